@@ -1,0 +1,20 @@
+# SPDX-License-Identifier: Apache-2.0
+# How our own code is compiled. Warnings are errors in our builds; a packager who meets a newer compiler turns that off.
+
+option(SSOCLIENT_WERROR "Treat warnings as errors" ${PROJECT_IS_TOP_LEVEL})
+
+add_library(ssoclient_options INTERFACE)
+target_compile_options(ssoclient_options INTERFACE
+  -Wall -Wextra -Wpedantic -Wshadow -Wconversion -Wsign-conversion -Wnon-virtual-dtor -Woverloaded-virtual
+  -Wcast-qual -Wformat=2 -Wimplicit-fallthrough -Wundef
+  $<$<BOOL:${SSOCLIENT_WERROR}>:-Werror>)
+if(NOT CMAKE_BUILD_TYPE STREQUAL "Debug" AND NOT SSOCLIENT_SANITIZERS)
+  target_compile_definitions(ssoclient_options INTERFACE _FORTIFY_SOURCE=2)
+endif()
+target_compile_options(ssoclient_options INTERFACE -fstack-protector-strong)
+
+if(SSOCLIENT_SANITIZERS)
+  list(JOIN SSOCLIENT_SANITIZERS "," sanitizers)
+  add_compile_options(-fsanitize=${sanitizers} -fno-sanitize-recover=all -fno-omit-frame-pointer)
+  add_link_options(-fsanitize=${sanitizers})
+endif()

@@ -1,0 +1,102 @@
+// SPDX-License-Identifier: Apache-2.0
+/// @file
+/// The root of every exception that the platform and the client raise, and the platform's general exceptions.
+
+#pragma once
+
+#include <tarvel/core/export.h>
+
+#include <exception>
+#include <memory>
+#include <string>
+
+namespace Tarvel {
+
+/// A message text and the call stack at the place where the exception was made.
+class TARVEL_API Exception : public std::exception {
+public:
+  explicit Exception(const std::string &message);
+  Exception(const Exception &) noexcept;
+  Exception &operator=(const Exception &) noexcept;
+  ~Exception() override;
+
+  /// The message; valid as long as the exception. Never null.
+  const char *what() const noexcept override;
+
+  /// The call stack at construction, one frame a line, as far as symbols are to be had. Costly: for diagnosis only.
+  virtual std::string GetBacktrace() const;
+
+  /// Class, message and call stack in one text, for a diagnostic dump.
+  virtual std::string Dump() const;
+
+  /// The innermost frame of the call stack that is not the exception's own; empty when unknown.
+  virtual std::string Where() const;
+
+  /// A new copy of the same dynamic class, owned by the caller. It may be handed to another thread.
+  virtual Exception *Clone() const;
+
+  /// Raises a copy as its own dynamic class, so that a holder of a base reference rethrows the precise type.
+  [[noreturn]] virtual void Throw() const;
+
+private:
+  struct State;
+  std::shared_ptr<const State> m_state;
+};
+
+/// Adds what every exception class needs (`Clone` and `Throw` of its own dynamic class) to a class body.
+#define TARVEL_EXCEPTION_BODY(Class, Base)                                                                             \
+public:                                                                                                                \
+  explicit Class(const std::string &message) : Base(message) {}                                                        \
+  Class(const Class &) noexcept = default;                                                                             \
+  Class &operator=(const Class &) noexcept = default;                                                                  \
+  ~Class() override;                                                                                                   \
+  Class *Clone() const override;                                                                                       \
+  [[noreturn]] void Throw() const override
+
+/// Defines, in one source file, the members that `TARVEL_EXCEPTION_BODY` declares.
+#define TARVEL_DEFINE_EXCEPTION(Class)                                                                                 \
+  Class::~Class() = default;                                                                                           \
+  Class *Class::Clone() const {                                                                                        \
+    return new Class(*this);                                                                                           \
+  }                                                                                                                    \
+  void Class::Throw() const {                                                                                          \
+    throw *this;                                                                                                       \
+  }
+
+/// A bad argument. The message is "Invalid argument : " followed by the detail that the constructor is given.
+class TARVEL_API InvalidArgumentException : public Exception {
+public:
+  explicit InvalidArgumentException(const std::string &detail);
+  InvalidArgumentException(const InvalidArgumentException &) noexcept = default;
+  InvalidArgumentException &operator=(const InvalidArgumentException &) noexcept = default;
+  ~InvalidArgumentException() override;
+  InvalidArgumentException *Clone() const override;
+  [[noreturn]] void Throw() const override;
+};
+
+/// An operation on an object that is not in the state for it.
+class TARVEL_API InvalidStateException : public Exception {
+  TARVEL_EXCEPTION_BODY(InvalidStateException, Exception);
+};
+
+/// An object that is not of the class that is asked for.
+class TARVEL_API TypeMismatchException : public Exception {
+  TARVEL_EXCEPTION_BODY(TypeMismatchException, Exception);
+};
+
+/// Text that is not Base64 (RFC 4648, section 4; XML white space allowed between characters).
+class TARVEL_API Base64FormatException : public Exception {
+  TARVEL_EXCEPTION_BODY(Base64FormatException, Exception);
+};
+
+/// Text that is not a date-time of the xsd:dateTime form, or one that is out of range.
+class TARVEL_API DateTimeFormatException : public Exception {
+  TARVEL_EXCEPTION_BODY(DateTimeFormatException, Exception);
+};
+
+/// A file or stream that cannot be read or written; the message names it and the system's reason.
+class TARVEL_API IOException : public Exception {
+  TARVEL_EXCEPTION_BODY(IOException, Exception);
+};
+
+} // namespace Tarvel

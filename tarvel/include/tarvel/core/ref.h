@@ -1,0 +1,109 @@
+// SPDX-License-Identifier: Apache-2.0
+/// @file
+/// `Ref`, the intrusive counted reference, and `Object`, the base of what it counts.
+
+#pragma once
+
+#include <tarvel/core/export.h>
+
+#include <atomic>
+#include <cstddef>
+#include <cstdint>
+#include <type_traits>
+#include <utility>
+
+namespace Tarvel {
+
+/// Base of the platform's shared objects: a thread-safe count of the references to it. An object starts with no
+/// reference and is destroyed, through its virtual destructor, on the thread that drops the last one.
+class TARVEL_API Object {
+public:
+  Object(const Object &) = delete;
+  Object &operator=(const Object &) = delete;
+
+  void AddRef() const noexcept { m_references.fetch_add(1, std::memory_order_relaxed); }
+
+  void Release() const noexcept {
+    if (m_references.fetch_sub(1, std::memory_order_acq_rel) == 1) {
+      delete this;
+    }
+  }
+
+protected:
+  Object() noexcept = default;
+  virtual ~Object();
+
+private:
+  mutable std::atomic<std::uint32_t> m_references{0};
+};
+
+/// A counted reference to a `T` that has `AddRef` and `Release` (an `Object`, or a node of an XML tree). May be null.
+/// Copying shares, destroying releases. One `Ref` is for one thread at a time; copies may live on any thread.
+template <typename T>
+class Ref {
+public:
+  using element_type = T;
+
+  constexpr Ref() noexcept = default;
+  constexpr Ref(std::nullptr_t) noexcept {}
+
+  /// Shares `object`, which may be null.
+  explicit Ref(T *object) noexcept : m_object(object) {
+    if (m_object) {
+      m_object->AddRef();
+    }
+  }
+
+  Ref(const Ref &other) noexcept : Ref(other.m_object) {}
+  Ref(Ref &&other) noexcept : m_object(std::exchange(other.m_object, nullptr)) {}
+
+  template <typename U, typename = std::enable_if_t<std::is_convertible_v<U *, T *>>>
+  Ref(const Ref<U> &other) noexcept : Ref(other.get()) {}
+
+  template <typename U, typename = std::enable_if_t<std::is_convertible_v<U *, T *>>>
+  Ref(Ref<U> &&other) noexcept : m_object(other.Detach()) {}
+
+  ~Ref() {
+    if (m_object) {
+      m_object->Release();
+    }
+  }
+
+  Ref &operator=(Ref other) noexcept {
+    std::swap(m_object, other.m_object);
+    return *this;
+  }
+
+  T *get() const noexcept { return m_object; }
+  T &operator*() const noexcept { return *m_object; }
+  T *operator->() const noexcept { return m_object; }
+  explicit operator bool() const noexcept { return m_object != nullptr; }
+
+  void reset() noexcept { *this = Ref(); }
+
+  /// Gives the reference up without releasing it: the caller owns one count from here on.
+  [[nodiscard]] T *Detach() noexcept { return std::exchange(m_object, nullptr); }
+
+  template <typename U>
+  friend bool operator==(const Ref &left, const Ref<U> &right) noexcept {
+    return left.get() == right.get();
+  }
+  template <typename U>
+  friend bool operator!=(const Ref &left, const Ref<U> &right) noexcept {
+    return left.get() != right.get();
+  }
+
+private:
+  T *m_object = nullptr;
+};
+
+/// Makes a new `T` and the first reference to it.
+template <typename T, typename... Args>
+Ref<T> MakeRef(Args &&...args) {
+  return Ref<T>(new T(std::forward<Args>(args)...));
+}
+
+/// Raises `TypeMismatchException` naming the expected and the actual class.
+[[noreturn]] TARVEL_API void ThrowTypeMismatch(const char *expected, const char *actual);
+
+} // namespace Tarvel

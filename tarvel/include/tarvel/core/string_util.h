@@ -1,0 +1,50 @@
+// SPDX-License-Identifier: Apache-2.0
+/// @file
+/// Letter case, Base64 and UUID texts.
+
+#pragma once
+
+#include <tarvel/core/export.h>
+
+#include <cstddef>
+#include <cstdint>
+#include <string>
+#include <string_view>
+#include <vector>
+
+namespace Tarvel {
+
+/// Text helpers of the platform. All are free of state and of the process's locale, and safe on any thread.
+class TARVEL_API StringUtil {
+public:
+  StringUtil() = delete;
+
+  /// The upper-case form of UTF-8 text by Unicode's simple case mapping (one character to one character). Bytes that are
+  /// not UTF-8 stay as they are.
+  static std::string ToUpper(std::string_view text);
+
+  /// The lower-case form, likewise.
+  static std::string ToLower(std::string_view text);
+
+  /// A new random UUID (RFC 4122, version 4) as 36 lower-case characters, from the system's random source, or from the
+  /// source that `System::ScopedEnvironment` put in its place.
+  static std::string GenerateUuid();
+
+  /// Base64 (RFC 4648, section 4) with padding and without line breaks.
+  static std::string Base64Encode(const std::uint8_t *data, std::size_t length);
+  static std::string Base64Encode(const std::vector<std::uint8_t> &data);
+
+  /// The bytes of Base64 text. XML white space (tab, line feed, carriage return, blank) may stand anywhere.
+  /// @throws Base64FormatException for any other character, wrong or misplaced padding, padding bits that are not zero, or
+  ///         a length that no encoding has.
+  static std::vector<std::uint8_t> Base64Decode(std::string_view text);
+};
+
+/// How many characters `Base64_Encode` writes for `length` bytes, without a terminator.
+TARVEL_API std::size_t Base64_EncodedLength(std::size_t length);
+
+/// Writes the Base64 form of `length` bytes at `data` to `out`, which has room for `Base64_EncodedLength(length)`
+/// characters. Returns the number of characters written; nothing is terminated.
+TARVEL_API std::size_t Base64_Encode(const std::uint8_t *data, std::size_t length, char *out);
+
+} // namespace Tarvel

@@ -1,0 +1,70 @@
+// SPDX-License-Identifier: Apache-2.0
+/// @file
+/// X.509 certificates.
+
+#pragma once
+
+#include <tarvel/core/exception.h>
+#include <tarvel/core/export.h>
+#include <tarvel/core/ref.h>
+#include <tarvel/system/date_time.h>
+
+#include <cstddef>
+#include <cstdint>
+#include <string>
+#include <string_view>
+#include <vector>
+
+namespace Tarvel {
+namespace Crypto {
+
+/// Something wrong with a certificate, a key or a file that holds them; the message says what and where, with the
+/// cryptographic library's own words.
+class TARVEL_API CryptoException : public Exception {
+  TARVEL_EXCEPTION_BODY(CryptoException, Exception);
+};
+
+/// A certificate (RFC 5280) with its public key. Immutable; safe on any thread.
+class TARVEL_API Certificate : public Object {
+public:
+  /// The DER encoding; owned by the certificate.
+  virtual const std::vector<std::uint8_t> &GetDer() const noexcept = 0;
+
+  /// The subject's and the issuer's distinguished name as RFC 2253 writes it, as "CN=sts,O=Example".
+  virtual std::string GetSubject() const = 0;
+  virtual std::string GetIssuer() const = 0;
+
+  /// SHA-256 over the DER encoding, 64 lower-case hexadecimal digits.
+  virtual std::string GetSha256Thumbprint() const = 0;
+
+  virtual System::DateTime GetNotBefore() const = 0;
+  virtual System::DateTime GetNotAfter() const = 0;
+
+  /// The certificate as PEM text.
+  virtual std::string ToPem() const = 0;
+
+protected:
+  ~Certificate() override;
+};
+
+using CertificateList = std::vector<Ref<const Certificate>>;
+
+/// The certificate in DER form at `data`, all `length` bytes of it.
+/// @throws CryptoException when it does not decode, or bytes follow it.
+TARVEL_API Ref<const Certificate> CreateCertificateFromDer(const std::uint8_t *data, std::size_t length);
+
+/// The first certificate in PEM text.
+/// @throws CryptoException when there is none, or it does not decode.
+TARVEL_API Ref<const Certificate> CreateCertificateFromPem(std::string_view pem);
+
+/// All certificates of PEM text, in order: at least one.
+/// @throws CryptoException when there is none, one does not decode, or the text holds a private key.
+TARVEL_API CertificateList CreateCertificatesFromPem(std::string_view pem);
+
+/// All certificates of a file: PEM, or one in DER.
+/// @throws IOException when the file cannot be read.
+/// @throws CryptoException as above; the message begins with the path.
+TARVEL_API CertificateList LoadCertificates(const std::string &path);
+
+} // namespace Crypto
+} // namespace Tarvel

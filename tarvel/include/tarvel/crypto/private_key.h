@@ -1,0 +1,75 @@
+// SPDX-License-Identifier: Apache-2.0
+/// @file
+/// Private keys, and key stores that hold them with their certificates.
+
+#pragma once
+
+#include <tarvel/core/export.h>
+#include <tarvel/core/ref.h>
+#include <tarvel/crypto/certificate.h>
+
+#include <functional>
+#include <string>
+#include <string_view>
+
+namespace Tarvel {
+namespace Crypto {
+
+/// A passphrase that is missing or wrong.
+class TARVEL_API WrongPassphraseException : public CryptoException {
+  TARVEL_EXCEPTION_BODY(WrongPassphraseException, CryptoException);
+};
+
+/// A text, file or store without a private key.
+class TARVEL_API NoKeyException : public CryptoException {
+  TARVEL_EXCEPTION_BODY(NoKeyException, CryptoException);
+};
+
+/// A private key that is not the one of the certificate it was given with.
+class TARVEL_API KeyMismatchException : public CryptoException {
+  TARVEL_EXCEPTION_BODY(KeyMismatchException, CryptoException);
+};
+
+/// An RSA or EC private key. Secret: it cannot be printed, and its memory is wiped when the last reference goes.
+/// Immutable; safe on any thread.
+class TARVEL_API PrivateKey : public Object {
+public:
+  /// "RSA" or "EC".
+  virtual std::string GetAlgorithm() const = 0;
+  /// Size of the modulus or of the curve's order, in bits.
+  virtual unsigned GetBits() const = 0;
+
+protected:
+  ~PrivateKey() override;
+};
+
+/// Asked for the passphrase of an encrypted key, on the calling thread, at most once a call; the text is wiped after use.
+/// An empty function means that there is none.
+using PassphraseCallback = std::function<std::string()>;
+
+/// The first private key in PEM text (PKCS#8, plain or encrypted, or the traditional forms) or in DER.
+/// @throws NoKeyException when there is none. @throws WrongPassphraseException when it is encrypted and the passphrase is
+/// missing or wrong. @throws CryptoException when it does not decode, or is neither RSA nor EC.
+TARVEL_API Ref<const PrivateKey> CreatePrivateKey(std::string_view text, const PassphraseCallback &passphrase = {});
+
+/// The private key in a file, or in the store that an URI names (as "pkcs11:…", through the cryptographic library's
+/// loaders).
+/// @throws IOException when a file cannot be read; else as `CreatePrivateKey`, the message beginning with the path.
+TARVEL_API Ref<const PrivateKey> LoadPrivateKey(const std::string &pathOrUri, const PassphraseCallback &passphrase = {});
+
+/// A private key, its certificate, and the further certificates that a store holds.
+struct KeyStore {
+  Ref<const PrivateKey> privateKey;
+  Ref<const Certificate> certificate;
+  CertificateList others;
+};
+
+/// What a PKCS#12 file (RFC 7292) holds.
+/// @throws as `CreatePrivateKey`; `CryptoException` also when there is no certificate for the key.
+TARVEL_API KeyStore CreateKeyStoreFromPkcs12(std::string_view der, const PassphraseCallback &passphrase);
+
+/// @throws KeyMismatchException unless `key` is the private key of `certificate`.
+TARVEL_API void RequireKeyMatchesCertificate(const PrivateKey &key, const Certificate &certificate);
+
+} // namespace Crypto
+} // namespace Tarvel

@@ -1,0 +1,34 @@
+// SPDX-License-Identifier: Apache-2.0
+/// @file
+/// `Reader`, a stream of bytes to read, and the reader over a text.
+
+#pragma once
+
+#include <tarvel/core/export.h>
+#include <tarvel/core/ref.h>
+
+#include <cstddef>
+#include <string>
+
+namespace Tarvel {
+
+/// A stream of bytes with one position. For one thread at a time. A reader owns its bytes.
+class TARVEL_API Reader : public Object {
+public:
+  /// Reads up to `length` bytes into `buffer` and returns how many; 0 means the end.
+  /// @throws IOException when the source fails.
+  virtual std::size_t Read(char *buffer, std::size_t length) = 0;
+
+  /// Everything from here to the end. The reader stands at its end afterwards.
+  /// @param maximumBytes reading stops as soon as more than this is there; the result then holds at least one byte more.
+  /// @throws IOException when the source fails.
+  virtual std::string ReadToEnd(std::size_t maximumBytes);
+
+protected:
+  ~Reader() override;
+};
+
+/// A reader over `text`, which it keeps.
+TARVEL_API Ref<Reader> CreateStringReader(std::string text);
+
+} // namespace Tarvel

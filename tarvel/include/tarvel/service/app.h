@@ -1,0 +1,31 @@
+// SPDX-License-Identifier: Apache-2.0
+/// @file
+/// The application object: what the host process offers to the platform.
+
+#pragma once
+
+#include <tarvel/core/export.h>
+#include <tarvel/service/logger.h>
+
+namespace Tarvel {
+namespace Service {
+
+/// The process's one application object.
+class TARVEL_API App {
+public:
+  App(const App &) = delete;
+  App &operator=(const App &) = delete;
+
+  /// The root of all loggers. It has no sink at first: the library prints nothing.
+  virtual Ref<LogRoot> GetRootLogger() = 0;
+
+protected:
+  App() = default;
+  ~App() = default;
+};
+
+/// The application object, made on first use; it lives until the process ends. Safe on any thread.
+TARVEL_API App &GetApp();
+
+} // namespace Service
+} // namespace Tarvel

@@ -1,0 +1,85 @@
+// SPDX-License-Identifier: Apache-2.0
+/// @file
+/// `DateTime`, a point in time with its calendar fields.
+
+#pragma once
+
+#include <tarvel/core/export.h>
+
+#include <cstdint>
+#include <string>
+#include <string_view>
+
+namespace Tarvel {
+namespace System {
+
+/// A point in time: microseconds since 1970-01-01T00:00:00Z (leap seconds not counted, as in POSIX), from year 1 to year
+/// 9999 of the proleptic Gregorian calendar, together with the zone bias in which its fields are shown. A plain value.
+class TARVEL_API DateTime {
+public:
+  /// 1970-01-01T00:00:00Z.
+  constexpr DateTime() noexcept = default;
+
+  /// The date-time written in `text`, of the form xsd:dateTime (XML Schema 1.0, part 2, section 3.2.7): four-digit year,
+  /// any number of fraction digits (what is finer than a microsecond is cut off), zone "Z", "+hh:mm", "-hh:mm" up to 14
+  /// hours, or none, which means UTC. 24:00:00 is the next day's start. No white space around it.
+  /// @throws DateTimeFormatException when the text has another form or a field is out of range.
+  explicit DateTime(std::string_view text);
+
+  /// Microseconds since the epoch, UTC.
+  constexpr std::int64_t GetUtcTime() const noexcept { return m_utcMicroseconds; }
+
+  int GetCentury() const noexcept;      ///< the year divided by 100: 20 for 2013
+  int GetYear() const noexcept;         ///< the year within the century: 13 for 2013
+  int GetMonth() const noexcept;        ///< 1 to 12
+  int GetDay() const noexcept;          ///< day of month, 1 to 31
+  int GetDayOfWeek() const noexcept;    ///< 0 (Sunday) to 6
+  int GetHour() const noexcept;         ///< 0 to 23
+  int GetMinute() const noexcept;       ///< 0 to 59
+  int GetSecond() const noexcept;       ///< 0 to 59
+  int GetMillisecond() const noexcept;  ///< 0 to 999
+  int GetBiasMinutes() const noexcept { return m_biasMinutes; } ///< minutes east of UTC in which the fields are shown
+
+  /// "Z" for a zero bias, else the offset as "+hh:mm" or "-hh:mm".
+  std::string ToShortStringBias() const;
+
+  /// The platform's own text form: xsd:dateTime with three fraction digits and the zone, as 2013-05-07T09:03:01.042Z.
+  std::string ToString() const;
+
+  /// Two values are equal, or ordered, as their points in time are; the bias does not count.
+  friend constexpr bool operator==(const DateTime &a, const DateTime &b) noexcept {
+    return a.m_utcMicroseconds == b.m_utcMicroseconds;
+  }
+  friend constexpr bool operator!=(const DateTime &a, const DateTime &b) noexcept { return !(a == b); }
+  friend constexpr bool operator<(const DateTime &a, const DateTime &b) noexcept {
+    return a.m_utcMicroseconds < b.m_utcMicroseconds;
+  }
+
+private:
+  friend TARVEL_API DateTime DateTimeFromUtc(std::int64_t utcMicroseconds, bool local);
+
+  std::int64_t m_utcMicroseconds = 0;
+  std::int32_t m_biasMinutes = 0;
+};
+
+/// The point `utcMicroseconds` after the epoch; outside the years 1 to 9999 the nearest point inside (it saturates).
+/// @param local true to show the fields in the process's local zone, false for UTC.
+TARVEL_API DateTime DateTimeFromUtc(std::int64_t utcMicroseconds, bool local);
+
+/// Now, in UTC, from the system's real-time clock, or from the clock that `ScopedEnvironment` put in its place.
+TARVEL_API DateTime GetUtcDateTime();
+
+/// A date-time as a message argument: its `ToString` text.
+TARVEL_API std::string FormatMessageArgument(const DateTime &value);
+
+} // namespace System
+
+/// How log lines show a date-time.
+class TARVEL_API DatePrintFormatter {
+public:
+  DatePrintFormatter() = delete;
+  /// `DateTime::ToString` of `value`.
+  static std::string Format(const System::DateTime &value);
+};
+
+} // namespace Tarvel

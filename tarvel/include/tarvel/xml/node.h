@@ -1,0 +1,240 @@
+// SPDX-License-Identifier: Apache-2.0
+/// @file
+/// The nodes of an XML tree.
+///
+/// The nodes of one parsed document, or one node made alone, live in one arena, which is kept alive by every `Ref` to any of
+/// its nodes, by the `Document`, and by the arenas of the trees that its nodes were appended to. A plain pointer to a node
+/// is good as long as any of these is. A tree may be read from any number of threads, and changed from one thread while
+/// nobody else uses it. Texts are UTF-8; a view into a tree is good as long as the tree, and until that text is changed.
+
+#pragma once
+
+#include <tarvel/core/export.h>
+#include <tarvel/core/ref.h>
+#include <tarvel/io/writer.h>
+#include <tarvel/xml/qname.h>
+
+#include <cstdint>
+#include <string_view>
+
+namespace Tarvel {
+namespace Xml {
+
+class DocumentNode;
+class ElementNode;
+class NodeArena;
+class TreeBuilder;
+
+enum class NodeKind : std::uint8_t { DOCUMENT, ELEMENT, TEXT, COMMENT, PROCESSING_INSTRUCTION };
+
+/// What every node has. Nodes are made by the factories below and by the parser, never copied.
+class TARVEL_API Node {
+public:
+  Node(const Node &) = delete;
+  Node &operator=(const Node &) = delete;
+
+  NodeKind GetKind() const noexcept { return m_kind; }
+
+  /// The element or document that the node is a child of, or null.
+  const Node *GetParent() const noexcept { return m_parent; }
+  Node *GetParent() noexcept { return m_parent; }
+
+  const Node *GetFirstChild() const noexcept { return m_firstChild; }
+  Node *GetFirstChild() noexcept { return m_firstChild; }
+  const Node *GetNextSibling() const noexcept { return m_nextSibling; }
+  Node *GetNextSibling() noexcept { return m_nextSibling; }
+
+  /// The topmost node above, or the node itself.
+  const Node *GetRoot() const noexcept;
+
+  /// For `Ref`: they count references to the whole arena.
+  void AddRef() const noexcept;
+  void Release() const noexcept;
+
+protected:
+  Node(NodeKind kind, NodeArena *arena) noexcept : m_arena(arena), m_kind(kind) {}
+  ~Node() = default;
+
+  void AppendNode(Node *child);
+
+  NodeArena *m_arena;
+  Node *m_parent = nullptr;
+  Node *m_firstChild = nullptr;
+  Node *m_lastChild = nullptr;
+  Node *m_nextSibling = nullptr;
+  NodeKind m_kind;
+
+  friend class NodeArena;
+  friend class TreeBuilder;
+};
+
+/// Character data; adjacent character data and CDATA sections of a source are one node.
+class TARVEL_API TextNode final : public Node {
+public:
+  std::string_view GetValue() const noexcept { return m_value; }
+
+  /// @throws InvalidArgumentException when `value` is not UTF-8 or holds a character that XML 1.0 cannot carry.
+  void SetValue(std::string_view value);
+
+private:
+  explicit TextNode(NodeArena *arena) noexcept : Node(NodeKind::TEXT, arena) {}
+  std::string_view m_value;
+  friend class NodeArena;
+  friend class TreeBuilder;
+};
+
+class TARVEL_API CommentNode final : public Node {
+public:
+  std::string_view GetValue() const noexcept { return m_value; }
+
+private:
+  explicit CommentNode(NodeArena *arena) noexcept : Node(NodeKind::COMMENT, arena) {}
+  std::string_view m_value;
+  friend class NodeArena;
+  friend class TreeBuilder;
+};
+
+class TARVEL_API ProcessingInstructionNode final : public Node {
+public:
+  std::string_view GetTarget() const noexcept { return m_target; }
+  std::string_view GetData() const noexcept { return m_data; }
+
+private:
+  explicit ProcessingInstructionNode(NodeArena *arena) noexcept : Node(NodeKind::PROCESSING_INSTRUCTION, arena) {}
+  std::string_view m_target;
+  std::string_view m_data;
+  friend class NodeArena;
+  friend class TreeBuilder;
+};
+
+/// One attribute of an element, namespace declarations included ("xmlns" and "xmlns:prefix"), in document order.
+class TARVEL_API Attribute {
+public:
+  Attribute(const Attribute &) = delete;
+  Attribute &operator=(const Attribute &) = delete;
+
+  /// The name as written, prefix included.
+  std::string_view GetName() const noexcept { return m_name; }
+  std::string_view GetPrefix() const noexcept { return m_prefixLength ? m_name.substr(0, m_prefixLength) : std::string_view(); }
+  std::string_view GetLocalName() const noexcept { return m_prefixLength ? m_name.substr(m_prefixLength + 1) : m_name; }
+  std::string_view GetValue() const noexcept { return m_value; }
+
+  /// Whether this is "xmlns" or "xmlns:" followed by a prefix.
+  bool IsNamespaceDeclaration() const noexcept { return m_isNamespaceDeclaration; }
+
+  /// The next attribute of the same element, or null.
+  const Attribute *GetNext() const noexcept { return m_next; }
+
+private:
+  Attribute() noexcept = default;
+  std::string_view m_name;
+  std::string_view m_value;
+  Attribute *m_next = nullptr;
+  Attribute *m_nextDeclaration = nullptr; // the element's next namespace declaration
+  std::uint32_t m_prefixLength = 0;
+  bool m_isNamespaceDeclaration = false;
+  friend class ElementNode;
+  friend class NodeArena;
+  friend class TreeBuilder;
+};
+
+class TARVEL_API ElementNode final : public Node {
+public:
+  /// The name as written, prefix included.
+  std::string_view GetName() const noexcept { return m_name; }
+  std::string_view GetPrefix() const noexcept { return m_prefixLength ? m_name.substr(0, m_prefixLength) : std::string_view(); }
+  std::string_view GetLocalName() const noexcept { return m_prefixLength ? m_name.substr(m_prefixLength + 1) : m_name; }
+
+  /// Where the start tag begins in the source: line and column from 1, the column in bytes; both 0 for an element that
+  /// was not parsed.
+  std::uint32_t GetLine() const noexcept { return m_line; }
+  std::uint32_t GetColumn() const noexcept { return m_column; }
+
+  /// The namespace bound to `prefix` (empty: the default namespace) by the declarations in scope here, looked up afresh at
+  /// each call. "xml" and "xmlns" are always bound. The default namespace counts as bound to the empty text when nobody
+  /// declares it. A declaration with an empty value unbinds its prefix.
+  /// @return whether the prefix is bound; `uri` is written only then.
+  bool LookupNamespace(std::string_view prefix, std::string_view &uri) const noexcept;
+
+  /// The element's own qualified name; an unbound prefix yields the empty namespace.
+  QName GetQName() const;
+
+  /// Whether the element has that local name and its prefix is bound to that namespace.
+  bool HasQName(std::string_view namespaceUri, std::string_view localName) const noexcept;
+
+  const Attribute *GetFirstAttribute() const noexcept { return m_firstAttribute; }
+
+  /// The attribute of that qualified name (an empty namespace means: written without a prefix), or null. Namespace
+  /// declarations are not found by it.
+  const Attribute *FindAttribute(std::string_view namespaceUri, std::string_view localName) const noexcept;
+  const Attribute *FindAttribute(const QName &name) const noexcept;
+
+  /// Reads the attribute's value. @return whether the attribute is there; `value` is written only then.
+  bool GetAttribute(const QName &name, std::string_view &value) const noexcept;
+
+  /// The first child element of that qualified name, or null.
+  const ElementNode *FindChildElement(const QName &name) const noexcept;
+  ElementNode *FindChildElement(const QName &name) noexcept;
+
+  /// The first child element of that local name in any namespace, or null.
+  const ElementNode *FindChildElement(std::string_view localName) const noexcept;
+
+  /// Adds an attribute, or a namespace declaration, of that name as written; an attribute of the same name gets the new
+  /// value and keeps its place.
+  /// @throws InvalidArgumentException when the name is not a name of XML Namespaces 1.0, or the value is not UTF-8 or
+  ///         holds a character that XML 1.0 cannot carry.
+  void DefineAttribute(std::string_view qualifiedName, std::string_view value);
+
+  /// Makes `child` the last child. A document element may be taken out of its document by this; its document is then
+  /// without one.
+  /// @throws InvalidArgumentException when `child` is null, a document, the element itself or above it.
+  /// @throws InvalidStateException when `child` already is the child of an element.
+  void AppendChild(Node *child);
+
+  /// Writes the element and all below as UTF-8 XML, without an XML declaration. Text, attribute values and line ends are
+  /// escaped so that a parser gives back the same tree; an element without children is written as "<name></name>".
+  void WriteTo(Writer &writer) const;
+
+private:
+  explicit ElementNode(NodeArena *arena) noexcept : Node(NodeKind::ELEMENT, arena) {}
+  std::string_view m_name;
+  Attribute *m_firstAttribute = nullptr;
+  Attribute *m_lastAttribute = nullptr;
+  Attribute *m_firstDeclaration = nullptr;
+  std::uint32_t m_prefixLength = 0;
+  std::uint32_t m_line = 0;
+  std::uint32_t m_column = 0;
+  friend class NodeArena;
+  friend class TreeBuilder;
+};
+
+/// The root of a parsed document: its children are the document element and the comments and processing instructions
+/// around it.
+class TARVEL_API DocumentNode final : public Node {
+private:
+  explicit DocumentNode(NodeArena *arena) noexcept : Node(NodeKind::DOCUMENT, arena) {}
+  friend class NodeArena;
+  friend class TreeBuilder;
+};
+
+/// Checked downcasts; null for null and for a node of another kind.
+inline const ElementNode *AsElement(const Node *node) noexcept {
+  return node && node->GetKind() == NodeKind::ELEMENT ? static_cast<const ElementNode *>(node) : nullptr;
+}
+inline ElementNode *AsElement(Node *node) noexcept {
+  return node && node->GetKind() == NodeKind::ELEMENT ? static_cast<ElementNode *>(node) : nullptr;
+}
+inline const TextNode *AsText(const Node *node) noexcept {
+  return node && node->GetKind() == NodeKind::TEXT ? static_cast<const TextNode *>(node) : nullptr;
+}
+
+/// A new element, child of nothing, without attributes and children.
+/// @param prefix may be empty.
+/// @throws InvalidArgumentException when prefix or local name is not a name without a colon (NCName).
+TARVEL_API void CreateElementNode(std::string_view prefix, std::string_view localName, Ref<ElementNode> &out);
+
+/// A new text node, child of nothing, with an empty value.
+TARVEL_API void CreateTextNode(Ref<TextNode> &out);
+
+} // namespace Xml
+} // namespace Tarvel

@@ -1,0 +1,93 @@
+// SPDX-License-Identifier: Apache-2.0
+/// @file
+/// The XML parser and the handler that makes a tree of what it reads.
+
+#pragma once
+
+#include <tarvel/core/exception.h>
+#include <tarvel/core/export.h>
+#include <tarvel/core/ref.h>
+#include <tarvel/io/reader.h>
+#include <tarvel/xml/document.h>
+
+#include <cstddef>
+#include <cstdint>
+#include <string>
+#include <string_view>
+
+namespace Tarvel {
+namespace Xml {
+
+/// A document that is not well-formed (XML 1.0, Namespaces in XML 1.0), or that has what this platform refuses: a document
+/// type declaration, an encoding other than UTF-8, or more than one of the limits below. The message ends in
+/// " at line L, column C".
+class TARVEL_API XMLParseException : public Exception {
+public:
+  XMLParseException(const std::string &detail, std::uint32_t line, std::uint32_t column);
+  XMLParseException(const XMLParseException &) noexcept = default;
+  XMLParseException &operator=(const XMLParseException &) noexcept = default;
+  ~XMLParseException() override;
+  XMLParseException *Clone() const override;
+  [[noreturn]] void Throw() const override;
+
+  std::uint32_t GetLine() const noexcept { return m_line; }     ///< from 1
+  std::uint32_t GetColumn() const noexcept { return m_column; } ///< from 1, in bytes
+
+private:
+  std::uint32_t m_line;
+  std::uint32_t m_column;
+};
+
+constexpr std::size_t MAX_DOCUMENT_BYTES = 16u * 1024 * 1024; ///< a longer document is refused
+constexpr unsigned MAX_ELEMENT_DEPTH = 256;                   ///< the document element has depth 1
+constexpr unsigned MAX_ATTRIBUTES = 256;                      ///< of one element, namespace declarations included
+constexpr unsigned MAX_NAMESPACES_IN_SCOPE = 256;             ///< declarations in force at one element
+
+/// Receives a document as it is parsed. The platform's one handler is the document handler.
+class XMLHandler;
+
+/// A parser bound to one handler. For one thread at a time.
+class TARVEL_API XMLParser : public Object {
+public:
+  /// Reads `reader` to its end and returns what the handler made of the document.
+  /// @throws XMLParseException as that class says; the handler then yields nothing.
+  /// @throws IOException when the reader fails.
+  virtual Ref<Object> Parse(Reader &reader) = 0;
+
+protected:
+  ~XMLParser() override;
+};
+
+/// A handler that builds a `Document`.
+TARVEL_API Ref<XMLHandler> CreateXMLDocumentHandler();
+
+/// A parser on `handler`.
+TARVEL_API Ref<XMLParser> CreateXMLParser(const Ref<XMLHandler> &handler);
+
+/// One attribute of a start tag; the views are valid during the call.
+struct AttributeEvent {
+  std::string_view name; ///< as written, prefix included; "xmlns" and "xmlns:p" for declarations
+  std::string_view value;
+};
+
+class TARVEL_API XMLHandler : public Object {
+public:
+  /// A document begins. `source` is its text; it stays where it is, and alive, as long as somebody holds `owner`, so that
+  /// views into it need not be copied.
+  virtual void StartDocument(std::string_view source, const Ref<Object> &owner) = 0;
+  virtual void StartElement(std::string_view name, const AttributeEvent *attributes, std::size_t count,
+                            std::uint32_t line, std::uint32_t column) = 0;
+  virtual void EndElement() = 0;
+  /// A piece of character data or of a CDATA section; adjacent ones belong together.
+  virtual void Characters(std::string_view text) = 0;
+  virtual void Comment(std::string_view text) = 0;
+  virtual void ProcessingInstruction(std::string_view target, std::string_view data) = 0;
+  /// What was made; called once, after the end of a well-formed document.
+  virtual Ref<Object> TakeResult() = 0;
+
+protected:
+  ~XMLHandler() override;
+};
+
+} // namespace Xml
+} // namespace Tarvel

@@ -1,0 +1,51 @@
+// SPDX-License-Identifier: Apache-2.0
+/// @file
+/// Canonical XML.
+
+#pragma once
+
+#include <tarvel/core/export.h>
+#include <tarvel/core/ref.h>
+#include <tarvel/io/writer.h>
+#include <tarvel/xml/node.h>
+
+#include <string>
+#include <string_view>
+#include <vector>
+
+namespace Tarvel {
+namespace Xml {
+namespace Security {
+
+/// Algorithm URIs of canonicalisation.
+namespace CanonicalizationUri {
+constexpr std::string_view INCLUSIVE = "http://www.w3.org/TR/2001/REC-xml-c14n-20010315";
+constexpr std::string_view INCLUSIVE_WITH_COMMENTS = "http://www.w3.org/TR/2001/REC-xml-c14n-20010315#WithComments";
+constexpr std::string_view EXCLUSIVE = "http://www.w3.org/2001/10/xml-exc-c14n#";
+constexpr std::string_view EXCLUSIVE_WITH_COMMENTS = "http://www.w3.org/2001/10/xml-exc-c14n#WithComments";
+} // namespace CanonicalizationUri
+
+/// Writes nodes in the canonical form of one algorithm. Immutable; safe on any thread.
+class TARVEL_API Canonicalizer : public Object {
+public:
+  /// Writes the canonical form of the subtree at `node` (a document node: of the whole document) as it stands in its
+  /// document, octet for octet, piece by piece.
+  /// @throws XmlSecurityException when the tree has no canonical form: an unbound prefix, or a relative namespace name.
+  ///         What was written before is then of no use.
+  virtual void Canonicalize(const Node &node, Writer &writer) const = 0;
+
+protected:
+  ~Canonicalizer() override;
+};
+
+/// The canonicalizer for an algorithm URI: one of `CanonicalizationUri`, or the inclusive URI with a lone "#" appended, which
+/// means the same algorithm.
+/// @param inclusivePrefixes for the exclusive algorithms, the InclusiveNamespaces PrefixList ("#default" is the default
+///        namespace); must be empty for the inclusive ones.
+/// @throws XmlSecurityException naming the URI, for any other algorithm.
+TARVEL_API Ref<Canonicalizer> CreateCanonicalizer(std::string_view algorithmUri,
+                                                  const std::vector<std::string> &inclusivePrefixes = {});
+
+} // namespace Security
+} // namespace Xml
+} // namespace Tarvel

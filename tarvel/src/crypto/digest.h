@@ -1,0 +1,40 @@
+// SPDX-License-Identifier: Apache-2.0
+/// @file
+/// Message digests, computed piece by piece.
+
+#pragma once
+
+#include <cstddef>
+#include <cstdint>
+#include <memory>
+#include <string_view>
+
+namespace Tarvel::Crypto {
+
+enum class DigestAlgorithm { SHA256, SHA384, SHA512 };
+
+constexpr std::size_t MAX_DIGEST_BYTES = 64;
+
+constexpr std::size_t DigestBytes(DigestAlgorithm algorithm) noexcept {
+  return algorithm == DigestAlgorithm::SHA256 ? 32 : algorithm == DigestAlgorithm::SHA384 ? 48 : 64;
+}
+
+/// A digest in the making. For one thread.
+class Digest {
+public:
+  /// @throws CryptoException when the cryptographic library does not offer the algorithm.
+  explicit Digest(DigestAlgorithm algorithm);
+  Digest(const Digest &) = delete;
+  Digest &operator=(const Digest &) = delete;
+  ~Digest();
+
+  void Update(std::string_view bytes);
+
+  /// Writes `DigestBytes(algorithm)` bytes to `out`; the digest must not be used afterwards.
+  void Finish(std::uint8_t *out);
+
+private:
+  void *m_context; // EVP_MD_CTX
+};
+
+} // namespace Tarvel::Crypto

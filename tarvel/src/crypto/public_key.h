@@ -1,0 +1,38 @@
+// SPDX-License-Identifier: Apache-2.0
+/// @file
+/// Checking signature values with the public key of a certificate, and making them with a private key.
+
+#pragma once
+
+#include "crypto/digest.h"
+
+#include <tarvel/crypto/certificate.h>
+#include <tarvel/crypto/private_key.h>
+
+#include <cstddef>
+#include <cstdint>
+#include <string_view>
+#include <vector>
+
+namespace Tarvel::Crypto {
+
+enum class SignatureScheme { RSA_PKCS1, RSA_PSS, ECDSA };
+
+enum class KeyKind { RSA, EC_P256, EC_P384, EC_P521, OTHER };
+
+/// What kind of public key the certificate has; for RSA, `bits` is the modulus size.
+KeyKind GetKeyKind(const Certificate &certificate, unsigned &bits);
+
+/// Whether `signature` is the signature by the certificate's key over a message with that digest. An ECDSA value is r and
+/// s one after the other, as XML Signature has it (RFC 4050, section 3.3). RSA-PSS: MGF1 with the same digest, salt as long as
+/// the digest. Malformed values answer false. Safe on any thread; costs little beyond the arithmetic.
+/// @throws CryptoException when the cryptographic library itself fails.
+bool VerifyDigest(const Certificate &certificate, SignatureScheme scheme, DigestAlgorithm algorithm,
+                  const std::uint8_t *digest, const std::uint8_t *signature, std::size_t signatureLength);
+
+/// The signature over a message with that digest, in the same encodings.
+/// @throws CryptoException when the key does not fit the scheme or the cryptographic library fails.
+std::vector<std::uint8_t> SignDigest(const PrivateKey &key, SignatureScheme scheme, DigestAlgorithm algorithm,
+                                     const std::uint8_t *digest);
+
+} // namespace Tarvel::Crypto
