@@ -18,3 +18,11 @@ if(SSOCLIENT_SANITIZERS)
   add_compile_options(-fsanitize=${sanitizers} -fno-sanitize-recover=all -fno-omit-frame-pointer)
   add_link_options(-fsanitize=${sanitizers})
 endif()
+
+# The fuzzing engine steers by the coverage of all our code, not only of the fuzz targets.
+if(SSOCLIENT_FUZZ_ENGINE)
+  if(NOT CMAKE_CXX_COMPILER_ID MATCHES "Clang")
+    message(FATAL_ERROR "SSOCLIENT_FUZZ_ENGINE needs clang")
+  endif()
+  add_compile_options(-fsanitize=fuzzer-no-link)
+endif()
