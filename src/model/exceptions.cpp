@@ -1,0 +1,13 @@
+// SPDX-License-Identifier: Apache-2.0
+#include <ssoclient/exceptions.h>
+
+namespace SsoClient {
+
+TARVEL_DEFINE_EXCEPTION(SsoException)
+TARVEL_DEFINE_EXCEPTION(InvalidTokenException)
+TARVEL_DEFINE_EXCEPTION(InvalidSignatureException)
+TARVEL_DEFINE_EXCEPTION(ParseException)
+TARVEL_DEFINE_EXCEPTION(CommunicationException)
+TARVEL_DEFINE_EXCEPTION(InvalidCredentialsException)
+
+} // namespace SsoClient
