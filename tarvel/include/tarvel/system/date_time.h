@@ -22,7 +22,8 @@ public:
 
   /// The date-time written in `text`, of the form xsd:dateTime (XML Schema 1.0, part 2, section 3.2.7): four-digit year,
   /// any number of fraction digits (what is finer than a microsecond is cut off), zone "Z", "+hh:mm", "-hh:mm" up to 14
-  /// hours, or none, which means UTC. 24:00:00 is the next day's start. No white space around it.
+  /// hours, or none, which means UTC. 24:00:00 is the next day's start. No white space around it. The fields are shown in
+  /// the zone of the text.
   /// @throws DateTimeFormatException when the text has another form or a field is out of range.
   explicit DateTime(std::string_view text);
 

@@ -1,0 +1,114 @@
+// SPDX-License-Identifier: Apache-2.0
+
+#include <tarvel/core/exception.h>
+
+#include "core/demangle.h"
+
+#include <boost/stacktrace/frame.hpp>
+#include <boost/stacktrace/safe_dump_to.hpp>
+
+#include <algorithm>
+#include <array>
+#include <cstddef>
+#include <span>
+#include <string_view>
+#include <typeinfo>
+
+namespace Tarvel {
+
+namespace {
+
+/// Frames kept of a call stack: an exception is made far more often than its stack is looked at.
+constexpr std::size_t MAX_FRAMES = 32;
+
+using Address = boost::stacktrace::frame::native_frame_ptr_t;
+
+/// Whether `function` is, as text, the constructor of an exception class: "Space::SomeException::SomeException(…".
+bool IsExceptionConstructor(std::string_view function) {
+  constexpr std::string_view SUFFIX = "Exception";
+  const std::string_view name = function.substr(0, function.find('('));
+  const std::size_t separator = name.rfind("::");
+  if (separator == std::string_view::npos) {
+    return false;
+  }
+  const std::string_view member = name.substr(separator + 2);
+  const std::string_view scope = name.substr(0, separator);
+  return member.ends_with(SUFFIX) && scope.ends_with(member) &&
+         (scope.size() == member.size() || scope[scope.size() - member.size() - 1] == ':');
+}
+
+} // namespace
+
+struct Exception::State {
+  State(const std::string &text, Address caller) : message(text) {
+    // Only addresses are taken here; names are looked up when somebody asks for them.
+    const std::size_t written = boost::stacktrace::safe_dump_to(frames.data(), sizeof frames);
+    const auto end = std::find(frames.begin(), frames.begin() + static_cast<std::ptrdiff_t>(written), nullptr);
+    const auto first = std::find(frames.begin(), end, caller);
+    // Everything inside of the constructor's caller is the machinery that took the stack.
+    begin = first == end ? 0 : static_cast<std::size_t>(first - frames.begin());
+    count = static_cast<std::size_t>(end - frames.begin()) - begin;
+  }
+
+  std::span<const Address> Stack() const noexcept { return std::span(frames).subspan(begin, count); }
+
+  std::string message;
+  std::array<Address, MAX_FRAMES + 1> frames{};
+  std::size_t begin = 0;
+  std::size_t count = 0;
+};
+
+// Never inlined, so that its return address is where the exception, or the part of it that derives from this, was made.
+__attribute__((noinline)) Exception::Exception(const std::string &message)
+    : m_state(std::make_shared<const State>(message, __builtin_return_address(0))) {}
+
+Exception::Exception(const Exception &) noexcept = default;
+Exception &Exception::operator=(const Exception &) noexcept = default;
+Exception::~Exception() = default;
+
+const char *Exception::what() const noexcept {
+  return m_state->message.c_str();
+}
+
+std::string Exception::GetBacktrace() const {
+  std::string text;
+  for (const Address address : m_state->Stack()) {
+    text += boost::stacktrace::to_string(boost::stacktrace::frame(address));
+    text += '\n';
+  }
+  return text;
+}
+
+std::string Exception::Dump() const {
+  return Demangle(typeid(*this).name()) + ": " + m_state->message + '\n' + GetBacktrace();
+}
+
+std::string Exception::Where() const {
+  for (const Address address : m_state->Stack()) {
+    const boost::stacktrace::frame frame(address);
+    if (!IsExceptionConstructor(frame.name())) {
+      return boost::stacktrace::to_string(frame);
+    }
+  }
+  return {};
+}
+
+Exception *Exception::Clone() const {
+  return new Exception(*this);
+}
+
+void Exception::Throw() const {
+  throw *this;
+}
+
+InvalidArgumentException::InvalidArgumentException(const std::string &detail)
+    : Exception("Invalid argument : " + detail) {}
+
+TARVEL_DEFINE_EXCEPTION(InvalidArgumentException)
+TARVEL_DEFINE_EXCEPTION(InvalidStateException)
+TARVEL_DEFINE_EXCEPTION(TypeMismatchException)
+TARVEL_DEFINE_EXCEPTION(Base64FormatException)
+TARVEL_DEFINE_EXCEPTION(DateTimeFormatException)
+TARVEL_DEFINE_EXCEPTION(IOException)
+
+} // namespace Tarvel

@@ -1,0 +1,58 @@
+// SPDX-License-Identifier: Apache-2.0
+
+#include <tarvel/io/reader.h>
+
+#include <algorithm>
+#include <array>
+#include <cstring>
+#include <utility>
+
+namespace Tarvel {
+
+namespace {
+
+constexpr std::size_t CHUNK_LENGTH = 16 * 1024;
+
+class StringReaderImpl final : public Reader {
+public:
+  explicit StringReaderImpl(std::string text) noexcept : m_text(std::move(text)) {}
+
+  std::size_t Read(char *buffer, std::size_t length) override {
+    const std::size_t count = m_text.copy(buffer, length, m_position);
+    m_position += count;
+    return count;
+  }
+
+  std::string ReadToEnd(std::size_t) override {
+    std::string rest = std::exchange(m_text, std::string());
+    rest.erase(0, std::exchange(m_position, 0));
+    return rest;
+  }
+
+private:
+  std::string m_text;
+  std::size_t m_position = 0;
+};
+
+} // namespace
+
+Reader::~Reader() = default;
+
+std::string Reader::ReadToEnd(std::size_t maximumBytes) {
+  std::string text;
+  std::array<char, CHUNK_LENGTH> chunk;
+  while (text.size() <= maximumBytes) {
+    const std::size_t count = Read(chunk.data(), chunk.size());
+    if (count == 0) {
+      break;
+    }
+    text.append(chunk.data(), count);
+  }
+  return text;
+}
+
+Ref<Reader> CreateStringReader(std::string text) {
+  return MakeRef<StringReaderImpl>(std::move(text));
+}
+
+} // namespace Tarvel

@@ -1,0 +1,69 @@
+// SPDX-License-Identifier: Apache-2.0
+
+#include <tarvel/service/app.h>
+
+#include <memory>
+#include <mutex>
+#include <utility>
+
+namespace Tarvel {
+namespace Service {
+
+namespace {
+
+class LogRootImpl final : public LogRoot {
+public:
+  void SetSink(LogSink sink) override {
+    std::shared_ptr<const LogSink> next = sink ? std::make_shared<const LogSink>(std::move(sink)) : nullptr;
+    {
+      const std::lock_guard<std::mutex> lock(m_mutex);
+      m_hasSink.store(next != nullptr, std::memory_order_relaxed);
+      m_sink.swap(next);
+    }
+    // The earlier sink goes here, outside the lock: its own destructor may log.
+  }
+
+  void Write(const LogRecord &record) noexcept override {
+    if (!HasSink()) {
+      return;
+    }
+    try {
+      if (const std::shared_ptr<const LogSink> sink = CurrentSink()) {
+        (*sink)(record);
+      }
+    } catch (...) {
+      // A log line is never worth the operation that it tells of.
+    }
+  }
+
+  bool HasSink() const noexcept override { return m_hasSink.load(std::memory_order_relaxed); }
+
+private:
+  std::shared_ptr<const LogSink> CurrentSink() const {
+    const std::lock_guard<std::mutex> lock(m_mutex);
+    return m_sink;
+  }
+
+  mutable std::mutex m_mutex;
+  std::shared_ptr<const LogSink> m_sink;
+  std::atomic<bool> m_hasSink{false};
+};
+
+class AppImpl final : public App {
+public:
+  Ref<LogRoot> GetRootLogger() override { return m_root; }
+
+private:
+  const Ref<LogRoot> m_root = MakeRef<LogRootImpl>();
+};
+
+} // namespace
+
+App &GetApp() {
+  // Never destroyed: a thread may log as long as the process lives, past the end of static objects.
+  static AppImpl *const app = new AppImpl;
+  return *app;
+}
+
+} // namespace Service
+} // namespace Tarvel

@@ -1,0 +1,198 @@
+// SPDX-License-Identifier: Apache-2.0
+
+#include <tarvel/system/date_time.h>
+
+#include "system/current_environment.h"
+#include "system/date_time_text.h"
+
+#include <algorithm>
+#include <chrono>
+#include <cstdlib>
+#include <ctime>
+
+namespace Tarvel {
+namespace System {
+
+namespace {
+
+using std::chrono::days;
+using std::chrono::floor;
+using std::chrono::microseconds;
+using std::chrono::minutes;
+using std::chrono::sys_days;
+using std::chrono::year_month_day;
+
+using TimePoint = std::chrono::sys_time<microseconds>;
+
+constexpr std::int64_t SECONDS_PER_MINUTE = 60;
+
+/// Zones further from UTC than this have no text in xsd:dateTime.
+constexpr std::int64_t MAX_BIAS_MINUTES = 14 * 60;
+
+constexpr std::int64_t MicrosecondsAt(sys_days day) {
+  return microseconds(day.time_since_epoch()).count();
+}
+
+constexpr std::int64_t MIN_MICROSECONDS = MicrosecondsAt(std::chrono::year(1) / 1 / 1);
+constexpr std::int64_t MAX_MICROSECONDS = MicrosecondsAt(std::chrono::year(10000) / 1 / 1) - 1;
+
+constexpr bool IsInRange(std::int64_t value) {
+  return value >= MIN_MICROSECONDS && value <= MAX_MICROSECONDS;
+}
+
+/// The clock on the wall where the value is shown, as if it were UTC.
+TimePoint Shown(const DateTime &value) {
+  return TimePoint(microseconds(value.GetUtcTime()) + minutes(value.GetBiasMinutes()));
+}
+
+year_month_day DateOf(const DateTime &value) {
+  return year_month_day(floor<days>(Shown(value)));
+}
+
+int YearOf(const DateTime &value) {
+  return static_cast<int>(DateOf(value).year());
+}
+
+/// The whole units `Unit` that have passed, where the value is shown, since the last whole `Larger`.
+template <typename Unit, typename Larger>
+int UnitsInto(const DateTime &value) {
+  const TimePoint shown = Shown(value);
+  return static_cast<int>(floor<Unit>(shown - floor<Larger>(shown)).count());
+}
+
+/// How far the process's local zone is from UTC at that point; 0 when that is unknown or has no text.
+std::int32_t LocalBiasMinutes(std::int64_t utcMicroseconds) {
+  const std::time_t seconds = floor<std::chrono::seconds>(microseconds(utcMicroseconds)).count();
+  std::tm local{};
+  if (!::localtime_r(&seconds, &local)) {
+    return 0;
+  }
+  // Local mean times of the nineteenth century have seconds, which a bias cannot show.
+  const std::int64_t bias = local.tm_gmtoff / SECONDS_PER_MINUTE;
+  const bool shows = bias >= -MAX_BIAS_MINUTES && bias <= MAX_BIAS_MINUTES &&
+                     IsInRange(utcMicroseconds + microseconds(minutes(bias)).count());
+  return shows ? static_cast<std::int32_t>(bias) : 0;
+}
+
+void AppendDigits(std::string &text, int value, int digits) {
+  text.append(static_cast<std::size_t>(digits), '0');
+  for (std::size_t i = text.size(); digits > 0; --digits, value /= 10) {
+    text[--i] = static_cast<char>('0' + value % 10);
+  }
+}
+
+} // namespace
+
+DateTime::DateTime(std::string_view text) {
+  const DateTimeFields fields = ParseDateTimeText(text);
+  const year_month_day date(std::chrono::year(fields.year), std::chrono::month(fields.month),
+                            std::chrono::day(fields.day));
+  if (!date.ok()) {
+    RefuseDateTimeText(text, "the month does not have that day");
+  }
+  const microseconds timeOfDay = std::chrono::hours(fields.hour) + minutes(fields.minute) +
+                                 std::chrono::seconds(fields.second) + microseconds(fields.microsecond);
+  const std::int64_t shown = MicrosecondsAt(date) + timeOfDay.count();
+  const std::int64_t utc = shown - microseconds(minutes(fields.biasMinutes)).count();
+  if (!IsInRange(shown) || !IsInRange(utc)) {
+    RefuseDateTimeText(text, "outside the years 1 to 9999");
+  }
+  m_utcMicroseconds = utc;
+  m_biasMinutes = fields.biasMinutes;
+}
+
+int DateTime::GetCentury() const noexcept {
+  return YearOf(*this) / 100;
+}
+
+int DateTime::GetYear() const noexcept {
+  return YearOf(*this) % 100;
+}
+
+int DateTime::GetMonth() const noexcept {
+  return static_cast<int>(static_cast<unsigned>(DateOf(*this).month()));
+}
+
+int DateTime::GetDay() const noexcept {
+  return static_cast<int>(static_cast<unsigned>(DateOf(*this).day()));
+}
+
+int DateTime::GetDayOfWeek() const noexcept {
+  return static_cast<int>(std::chrono::weekday(floor<days>(Shown(*this))).c_encoding());
+}
+
+int DateTime::GetHour() const noexcept {
+  return UnitsInto<std::chrono::hours, days>(*this);
+}
+
+int DateTime::GetMinute() const noexcept {
+  return UnitsInto<minutes, std::chrono::hours>(*this);
+}
+
+int DateTime::GetSecond() const noexcept {
+  return UnitsInto<std::chrono::seconds, minutes>(*this);
+}
+
+int DateTime::GetMillisecond() const noexcept {
+  return UnitsInto<std::chrono::milliseconds, std::chrono::seconds>(*this);
+}
+
+std::string DateTime::ToShortStringBias() const {
+  if (m_biasMinutes == 0) {
+    return "Z";
+  }
+  const int minutesAway = std::abs(m_biasMinutes);
+  std::string text(1, m_biasMinutes < 0 ? '-' : '+');
+  AppendDigits(text, minutesAway / 60, 2);
+  text += ':';
+  AppendDigits(text, minutesAway % 60, 2);
+  return text;
+}
+
+std::string DateTime::ToString() const {
+  const year_month_day date = DateOf(*this);
+  std::string text;
+  text.reserve(sizeof "2013-05-07T09:03:01.042+00:00");
+  AppendDigits(text, static_cast<int>(date.year()), 4);
+  text += '-';
+  AppendDigits(text, GetMonth(), 2);
+  text += '-';
+  AppendDigits(text, GetDay(), 2);
+  text += 'T';
+  AppendDigits(text, GetHour(), 2);
+  text += ':';
+  AppendDigits(text, GetMinute(), 2);
+  text += ':';
+  AppendDigits(text, GetSecond(), 2);
+  text += '.';
+  AppendDigits(text, GetMillisecond(), 3);
+  return text + ToShortStringBias();
+}
+
+DateTime DateTimeFromUtc(std::int64_t utcMicroseconds, bool local) {
+  DateTime value;
+  value.m_utcMicroseconds = std::clamp(utcMicroseconds, MIN_MICROSECONDS, MAX_MICROSECONDS);
+  value.m_biasMinutes = local ? LocalBiasMinutes(value.m_utcMicroseconds) : 0;
+  return value;
+}
+
+DateTime GetUtcDateTime() {
+  const Environment *const environment = CurrentEnvironment();
+  if (environment && environment->utcMicroseconds) {
+    return DateTimeFromUtc(environment->utcMicroseconds(), false);
+  }
+  const auto now = std::chrono::system_clock::now().time_since_epoch();
+  return DateTimeFromUtc(floor<microseconds>(now).count(), false);
+}
+
+std::string FormatMessageArgument(const DateTime &value) {
+  return value.ToString();
+}
+
+} // namespace System
+
+std::string DatePrintFormatter::Format(const System::DateTime &value) {
+  return value.ToString();
+}
+
+} // namespace Tarvel

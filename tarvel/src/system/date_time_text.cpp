@@ -1,0 +1,148 @@
+// SPDX-License-Identifier: Apache-2.0
+
+#include "system/date_time_text.h"
+
+#include <tarvel/core/exception.h>
+
+#include <string>
+
+namespace Tarvel {
+namespace System {
+
+namespace {
+
+/// Bytes of a refused text that its message repeats: the text may be as long as a document.
+constexpr std::size_t MAX_QUOTED_LENGTH = 64;
+
+constexpr int MAX_BIAS_HOURS = 14;
+
+constexpr bool IsDigit(char c) noexcept {
+  return c >= '0' && c <= '9';
+}
+
+struct Fraction {
+  int microseconds;
+  bool isZero; ///< whether every digit is 0, also those finer than a microsecond
+};
+
+/// Reads the text from left to right and refuses the whole of it at the first thing that does not belong.
+class Scanner {
+public:
+  explicit Scanner(std::string_view text) noexcept : m_text(text) {}
+
+  bool AtEnd() const noexcept { return m_position == m_text.size(); }
+
+  /// Steps over `c` if it is next.
+  bool Skip(char c) noexcept {
+    if (AtEnd() || m_text[m_position] != c) {
+      return false;
+    }
+    ++m_position;
+    return true;
+  }
+
+  void Require(char c) {
+    if (!Skip(c)) {
+      RefuseForm();
+    }
+  }
+
+  /// A number of exactly so many digits.
+  int Number(int digits, int minimum, int maximum, const char *field) {
+    int value = 0;
+    for (int i = 0; i < digits; ++i) {
+      value = value * 10 + Digit();
+    }
+    if (value < minimum || value > maximum) {
+      Refuse(std::string(field) + " out of range");
+    }
+    return value;
+  }
+
+  /// The digits after the point: at least one.
+  Fraction FractionDigits() {
+    int microseconds = 0;
+    bool isZero = true;
+    int scale = 100'000;
+    do {
+      const int digit = Digit();
+      isZero = isZero && digit == 0;
+      microseconds += digit * scale;
+      scale /= 10;
+    } while (!AtEnd() && IsDigit(m_text[m_position]));
+    return {microseconds, isZero};
+  }
+
+  /// What may follow the time: "Z", an offset, or nothing. In minutes east of UTC.
+  int Zone() {
+    if (AtEnd() || Skip('Z')) {
+      return 0;
+    }
+    const bool east = Skip('+');
+    if (!east) {
+      Require('-');
+    }
+    const int hours = Number(2, 0, MAX_BIAS_HOURS, "zone");
+    Require(':');
+    const int minutes = Number(2, 0, hours == MAX_BIAS_HOURS ? 0 : 59, "zone");
+    return (hours * 60 + minutes) * (east ? 1 : -1);
+  }
+
+  void RequireEnd() {
+    if (!AtEnd()) {
+      RefuseForm();
+    }
+  }
+
+  [[noreturn]] void Refuse(std::string_view reason) const { RefuseDateTimeText(m_text, reason); }
+
+private:
+  int Digit() {
+    if (AtEnd() || !IsDigit(m_text[m_position])) {
+      RefuseForm();
+    }
+    return m_text[m_position++] - '0';
+  }
+
+  [[noreturn]] void RefuseForm() const {
+    Refuse(AtEnd() ? "cut short" : "malformed at character " + std::to_string(m_position + 1));
+  }
+
+  std::string_view m_text;
+  std::size_t m_position = 0;
+};
+
+} // namespace
+
+DateTimeFields ParseDateTimeText(std::string_view text) {
+  Scanner scanner(text);
+  DateTimeFields fields{};
+  fields.year = scanner.Number(4, 1, 9999, "year");
+  scanner.Require('-');
+  fields.month = static_cast<unsigned>(scanner.Number(2, 1, 12, "month"));
+  scanner.Require('-');
+  fields.day = static_cast<unsigned>(scanner.Number(2, 1, 31, "day"));
+  scanner.Require('T');
+  fields.hour = scanner.Number(2, 0, 24, "hour");
+  scanner.Require(':');
+  fields.minute = scanner.Number(2, 0, 59, "minute");
+  scanner.Require(':');
+  fields.second = scanner.Number(2, 0, 59, "second");
+  const Fraction fraction = scanner.Skip('.') ? scanner.FractionDigits() : Fraction{0, true};
+  fields.microsecond = fraction.microseconds;
+  fields.biasMinutes = scanner.Zone();
+  scanner.RequireEnd();
+  if (fields.hour == 24 && (fields.minute != 0 || fields.second != 0 || !fraction.isZero)) {
+    scanner.Refuse("hour out of range");
+  }
+  return fields;
+}
+
+void RefuseDateTimeText(std::string_view text, std::string_view reason) {
+  const bool quotedWhole = text.size() <= MAX_QUOTED_LENGTH;
+  throw DateTimeFormatException("\"" + std::string(text.substr(0, MAX_QUOTED_LENGTH)) + (quotedWhole ? "" : "...") +
+                                "\" is not a date-time: " + std::string(reason));
+}
+
+} // namespace System
+} // namespace Tarvel
