@@ -72,7 +72,7 @@ void AppendUtf8(std::string &text, wint_t value) {
     return;
   }
   const int continuations = value < 0x800 ? 1 : value < 0x10000 ? 2 : 3;
-  const unsigned lead = (0xF00U >> continuations) & 0xFFU;
+  const unsigned lead = (0xF00U >> (continuations + 1)) & 0xFFU;
   text += static_cast<char>(lead | value >> (6 * continuations));
   for (int i = continuations - 1; i >= 0; --i) {
     text += static_cast<char>(0x80U | ((value >> (6 * i)) & 0x3FU));
