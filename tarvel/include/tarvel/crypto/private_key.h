@@ -55,7 +55,8 @@ TARVEL_API Ref<const PrivateKey> CreatePrivateKey(std::string_view text, const P
 /// The private key in a file, or in the store that an URI names (as "pkcs11:…", through the cryptographic library's
 /// loaders).
 /// @throws IOException when a file cannot be read; else as `CreatePrivateKey`, the message beginning with the path.
-TARVEL_API Ref<const PrivateKey> LoadPrivateKey(const std::string &pathOrUri, const PassphraseCallback &passphrase = {});
+TARVEL_API Ref<const PrivateKey> LoadPrivateKey(const std::string &pathOrUri,
+                                                const PassphraseCallback &passphrase = {});
 
 /// A private key, its certificate, and the further certificates that a store holds.
 struct KeyStore {

@@ -30,15 +30,15 @@ public:
   /// Microseconds since the epoch, UTC.
   constexpr std::int64_t GetUtcTime() const noexcept { return m_utcMicroseconds; }
 
-  int GetCentury() const noexcept;      ///< the year divided by 100: 20 for 2013
-  int GetYear() const noexcept;         ///< the year within the century: 13 for 2013
-  int GetMonth() const noexcept;        ///< 1 to 12
-  int GetDay() const noexcept;          ///< day of month, 1 to 31
-  int GetDayOfWeek() const noexcept;    ///< 0 (Sunday) to 6
-  int GetHour() const noexcept;         ///< 0 to 23
-  int GetMinute() const noexcept;       ///< 0 to 59
-  int GetSecond() const noexcept;       ///< 0 to 59
-  int GetMillisecond() const noexcept;  ///< 0 to 999
+  int GetCentury() const noexcept;                              ///< the year divided by 100: 20 for 2013
+  int GetYear() const noexcept;                                 ///< the year within the century: 13 for 2013
+  int GetMonth() const noexcept;                                ///< 1 to 12
+  int GetDay() const noexcept;                                  ///< day of month, 1 to 31
+  int GetDayOfWeek() const noexcept;                            ///< 0 (Sunday) to 6
+  int GetHour() const noexcept;                                 ///< 0 to 23
+  int GetMinute() const noexcept;                               ///< 0 to 59
+  int GetSecond() const noexcept;                               ///< 0 to 59
+  int GetMillisecond() const noexcept;                          ///< 0 to 999
   int GetBiasMinutes() const noexcept { return m_biasMinutes; } ///< minutes east of UTC in which the fields are shown
 
   /// "Z" for a zero bias, else the offset as "+hh:mm" or "-hh:mm".

@@ -115,7 +115,9 @@ public:
 
   /// The name as written, prefix included.
   std::string_view GetName() const noexcept { return m_name; }
-  std::string_view GetPrefix() const noexcept { return m_prefixLength ? m_name.substr(0, m_prefixLength) : std::string_view(); }
+  std::string_view GetPrefix() const noexcept {
+    return m_prefixLength ? m_name.substr(0, m_prefixLength) : std::string_view();
+  }
   std::string_view GetLocalName() const noexcept { return m_prefixLength ? m_name.substr(m_prefixLength + 1) : m_name; }
   std::string_view GetValue() const noexcept { return m_value; }
 
@@ -142,7 +144,9 @@ class TARVEL_API ElementNode final : public Node {
 public:
   /// The name as written, prefix included.
   std::string_view GetName() const noexcept { return m_name; }
-  std::string_view GetPrefix() const noexcept { return m_prefixLength ? m_name.substr(0, m_prefixLength) : std::string_view(); }
+  std::string_view GetPrefix() const noexcept {
+    return m_prefixLength ? m_name.substr(0, m_prefixLength) : std::string_view();
+  }
   std::string_view GetLocalName() const noexcept { return m_prefixLength ? m_name.substr(m_prefixLength + 1) : m_name; }
 
   /// Where the start tag begins in the source: line and column from 1, the column in bytes; both 0 for an element that
