@@ -37,4 +37,4 @@ template <typename Expected, typename Statement>
 
 /// Expects that `statement` throws exactly the class `Class`, not one derived from it, with exactly the text `message`.
 #define EXPECT_THROWS_MESSAGE(statement, Class, message)                                                               \
-  EXPECT_TRUE(::Testing::ThrowsMessage<Class>([&] { static_cast<void>(statement); }, message))
+  EXPECT_TRUE(::Testing::ThrowsMessage<Class>([&] { statement; }, message))
