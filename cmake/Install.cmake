@@ -1,0 +1,39 @@
+# SPDX-License-Identifier: Apache-2.0
+# What `cmake --install` puts where: both libraries, their public headers, the CMake package and the pkg-config files.
+# Components: "runtime" (what a program needs to run), "development" (what one needs to build it), "tools".
+
+include(CMakePackageConfigHelpers)
+
+install(TARGETS tarvel ssoclient EXPORT ssoclient-targets
+  RUNTIME COMPONENT runtime
+  LIBRARY COMPONENT runtime NAMELINK_COMPONENT development
+  ARCHIVE COMPONENT development
+  INCLUDES DESTINATION ${CMAKE_INSTALL_INCLUDEDIR})
+install(DIRECTORY include/ tarvel/include/ DESTINATION ${CMAKE_INSTALL_INCLUDEDIR} COMPONENT development
+  FILES_MATCHING PATTERN "*.h")
+
+set(ssoclient_package_dir ${CMAKE_INSTALL_LIBDIR}/cmake/ssoclient)
+install(EXPORT ssoclient-targets NAMESPACE ssoclient:: DESTINATION ${ssoclient_package_dir} COMPONENT development)
+configure_package_config_file(cmake/ssoclient-config.cmake.in ${PROJECT_BINARY_DIR}/ssoclient-config.cmake
+  INSTALL_DESTINATION ${ssoclient_package_dir})
+# Before 1.0 a minor release may change the interface, so a caller that asks for 0.1 gets 0.1.
+write_basic_package_version_file(${PROJECT_BINARY_DIR}/ssoclient-config-version.cmake COMPATIBILITY SameMinorVersion)
+install(FILES ${PROJECT_BINARY_DIR}/ssoclient-config.cmake ${PROJECT_BINARY_DIR}/ssoclient-config-version.cmake
+  DESTINATION ${ssoclient_package_dir} COMPONENT development)
+
+# The prefix in a pkg-config file follows the file, so that an installed tree can be moved.
+file(RELATIVE_PATH ssoclient_pc_to_prefix
+  ${CMAKE_INSTALL_FULL_LIBDIR}/pkgconfig ${CMAKE_INSTALL_PREFIX})
+string(REGEX REPLACE "/$" "" ssoclient_pc_to_prefix "${ssoclient_pc_to_prefix}")
+# Static libraries are linked with what they rest on by the program that uses them; shared ones name it themselves.
+set(ssoclient_pc_requires "")
+if(NOT BUILD_SHARED_LIBS)
+  set(ssoclient_pc_requires "Requires: openssl >= 3.0, libxml-2.0 >= 2.9.14")
+endif()
+foreach(name tarvel ssoclient)
+  configure_file(cmake/${name}.pc.in ${PROJECT_BINARY_DIR}/${name}.pc @ONLY)
+  install(FILES ${PROJECT_BINARY_DIR}/${name}.pc DESTINATION ${CMAKE_INSTALL_LIBDIR}/pkgconfig COMPONENT development)
+endforeach()
+
+install(FILES docs/man/ssoclient.1 DESTINATION ${CMAKE_INSTALL_MANDIR}/man1 COMPONENT tools)
+install(FILES LICENSE README.md CHANGELOG.md DESTINATION ${CMAKE_INSTALL_DOCDIR} COMPONENT runtime)
