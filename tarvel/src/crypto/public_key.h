@@ -23,9 +23,9 @@ enum class KeyKind { RSA, EC_P256, EC_P384, EC_P521, OTHER };
 /// What kind of public key the certificate has; for RSA, `bits` is the modulus size.
 KeyKind GetKeyKind(const Certificate &certificate, unsigned &bits);
 
-/// Whether `signature` is the signature by the certificate's key over a message with that digest. An ECDSA value is r and
-/// s one after the other, as XML Signature has it (RFC 4050, section 3.3). RSA-PSS: MGF1 with the same digest, salt as long as
-/// the digest. Malformed values answer false. Safe on any thread; costs little beyond the arithmetic.
+/// Whether `signature` is the signature by the certificate's key over a message with that digest. An ECDSA value is r
+/// and s one after the other, as XML Signature has it (RFC 4050, section 3.3). RSA-PSS: MGF1 with the same digest, salt
+/// as long as the digest. Malformed values answer false. Safe on any thread; costs little beyond the arithmetic.
 /// @throws CryptoException when the cryptographic library itself fails.
 bool VerifyDigest(const Certificate &certificate, SignatureScheme scheme, DigestAlgorithm algorithm,
                   const std::uint8_t *digest, const std::uint8_t *signature, std::size_t signatureLength);

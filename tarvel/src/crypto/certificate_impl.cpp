@@ -1,0 +1,175 @@
+// SPDX-License-Identifier: Apache-2.0
+
+#include "crypto/certificate_impl.h"
+
+#include "crypto/openssl_errors.h"
+
+#include <tarvel/core/ref.h>
+
+#include <openssl/pem.h>
+
+#include <array>
+#include <chrono>
+#include <ctime>
+#include <limits>
+#include <new>
+#include <string>
+#include <typeinfo>
+
+namespace Tarvel::Crypto {
+
+namespace {
+
+constexpr std::size_t MAX_CURVE_NAME_BYTES = 80;
+
+CertificateHandle Decode(const std::vector<std::uint8_t> &der) {
+  const OpenSslErrorScope errors;
+  if (der.empty() || der.size() > static_cast<std::size_t>(std::numeric_limits<long>::max())) {
+    throw CryptoException("Certificate of " + std::to_string(der.size()) + " bytes does not decode");
+  }
+  const unsigned char *position = der.data();
+  CertificateHandle native(d2i_X509(nullptr, &position, static_cast<long>(der.size())));
+  if (!native) {
+    errors.Throw("Certificate does not decode");
+  }
+  if (position != der.data() + der.size()) {
+    throw CryptoException("Certificate is followed by " + std::to_string(der.data() + der.size() - position) +
+                          " further bytes");
+  }
+  return native;
+}
+
+// OpenSSL reads BER too. Two encodings of one certificate would be two different certificates to whoever compares
+// bytes.
+void RequireCanonical(X509 *native, const std::vector<std::uint8_t> &der) {
+  const OpenSslErrorScope errors;
+  i2d_re_X509_tbs(native, nullptr); // makes the next line encode anew, instead of giving the bytes that were read
+  unsigned char *encoded = nullptr;
+  const int length = i2d_X509(native, &encoded);
+  const MemoryHandle owner(encoded);
+  if (length < 0) {
+    errors.Throw("Certificate does not encode");
+  }
+  if (!std::equal(der.begin(), der.end(), encoded, encoded + length)) {
+    throw CryptoException("Certificate is not in the distinguished encoding (DER)");
+  }
+}
+
+std::int64_t ToUtcMicroseconds(const ASN1_TIME *time) {
+  const OpenSslErrorScope errors;
+  std::tm fields{};
+  if (!time || ASN1_TIME_to_tm(time, &fields) != 1) {
+    errors.Throw("Certificate has a malformed validity date");
+  }
+  using namespace std::chrono;
+  const sys_days day = year(fields.tm_year + 1900) / month(static_cast<unsigned>(fields.tm_mon + 1)) /
+                       std::chrono::day(static_cast<unsigned>(fields.tm_mday));
+  const auto instant = day + hours(fields.tm_hour) + minutes(fields.tm_min) + seconds(fields.tm_sec);
+  return duration_cast<microseconds>(instant.time_since_epoch()).count();
+}
+
+KeyKind FindCurve(EVP_PKEY *key) {
+  std::array<char, MAX_CURVE_NAME_BYTES> name{};
+  if (EVP_PKEY_get_group_name(key, name.data(), name.size(), nullptr) != 1) {
+    return KeyKind::OTHER;
+  }
+  const std::string_view curve = name.data();
+  if (curve == "prime256v1") {
+    return KeyKind::EC_P256;
+  }
+  if (curve == "secp384r1") {
+    return KeyKind::EC_P384;
+  }
+  return curve == "secp521r1" ? KeyKind::EC_P521 : KeyKind::OTHER;
+}
+
+KeyKind FindKeyKind(EVP_PKEY *key) {
+  const OpenSslErrorScope errors;
+  if (!key) {
+    return KeyKind::OTHER;
+  }
+  if (EVP_PKEY_is_a(key, "RSA")) {
+    return KeyKind::RSA;
+  }
+  return EVP_PKEY_is_a(key, "EC") ? FindCurve(key) : KeyKind::OTHER;
+}
+
+std::string TakeBioText(BIO *bio) {
+  char *text = nullptr;
+  const long length = BIO_get_mem_data(bio, &text);
+  return length > 0 ? std::string(text, static_cast<std::size_t>(length)) : std::string();
+}
+
+BioHandle NewMemoryBio() {
+  BioHandle bio(BIO_new(BIO_s_mem()));
+  if (!bio) {
+    throw std::bad_alloc();
+  }
+  return bio;
+}
+
+std::string DescribeName(const X509_NAME *name) {
+  // RFC 2253 allows UTF-8 as it is; OpenSSL's flags would have every byte of it escaped.
+  constexpr unsigned long FLAGS = XN_FLAG_RFC2253 & ~static_cast<unsigned long>(ASN1_STRFLGS_ESC_MSB);
+  const OpenSslErrorScope errors;
+  const BioHandle bio = NewMemoryBio();
+  if (X509_NAME_print_ex(bio.get(), name, 0, FLAGS) < 0) {
+    errors.Throw("Distinguished name cannot be written");
+  }
+  return TakeBioText(bio.get());
+}
+
+} // namespace
+
+CertificateImpl::CertificateImpl(const std::uint8_t *data, std::size_t length)
+    : m_der(data, data + length), m_native(Decode(m_der)) {
+  RequireCanonical(m_native.get(), m_der);
+  m_notBefore = ToUtcMicroseconds(X509_get0_notBefore(m_native.get()));
+  m_notAfter = ToUtcMicroseconds(X509_get0_notAfter(m_native.get()));
+  const OpenSslErrorScope errors;
+  m_nativeKey = X509_get0_pubkey(m_native.get());
+  m_keyKind = FindKeyKind(m_nativeKey);
+  m_keyBits = m_nativeKey ? static_cast<unsigned>(EVP_PKEY_get_bits(m_nativeKey)) : 0;
+}
+
+std::string CertificateImpl::GetSubject() const {
+  return DescribeName(X509_get_subject_name(m_native.get()));
+}
+
+std::string CertificateImpl::GetIssuer() const {
+  return DescribeName(X509_get_issuer_name(m_native.get()));
+}
+
+std::string CertificateImpl::GetSha256Thumbprint() const {
+  constexpr std::string_view HEX_DIGITS = "0123456789abcdef";
+  std::array<std::uint8_t, DigestBytes(DigestAlgorithm::SHA256)> digest{};
+  Digest sha256(DigestAlgorithm::SHA256);
+  sha256.Update(std::string_view(reinterpret_cast<const char *>(m_der.data()), m_der.size()));
+  sha256.Finish(digest.data());
+  std::string text;
+  text.reserve(digest.size() * 2);
+  for (const std::uint8_t byte : digest) {
+    text.push_back(HEX_DIGITS[byte >> 4]);
+    text.push_back(HEX_DIGITS[byte & 0x0f]);
+  }
+  return text;
+}
+
+std::string CertificateImpl::ToPem() const {
+  const OpenSslErrorScope errors;
+  const BioHandle bio = NewMemoryBio();
+  if (PEM_write_bio_X509(bio.get(), m_native.get()) != 1) {
+    errors.Throw("Certificate cannot be written as PEM");
+  }
+  return TakeBioText(bio.get());
+}
+
+const CertificateImpl &AsImpl(const Certificate &certificate) {
+  const auto *const impl = dynamic_cast<const CertificateImpl *>(&certificate);
+  if (!impl) {
+    ThrowTypeMismatch(typeid(CertificateImpl).name(), typeid(certificate).name());
+  }
+  return *impl;
+}
+
+} // namespace Tarvel::Crypto

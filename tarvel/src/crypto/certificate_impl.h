@@ -1,0 +1,53 @@
+// SPDX-License-Identifier: Apache-2.0
+/// @file
+/// The one implementation of `Certificate`, over OpenSSL's.
+
+#pragma once
+
+#include "crypto/openssl_handles.h"
+#include "crypto/public_key.h"
+#include "crypto/verify_contexts.h"
+
+#include <tarvel/crypto/certificate.h>
+
+namespace Tarvel::Crypto {
+
+class CertificateImpl final : public Certificate {
+public:
+  /// @throws CryptoException when `data` is not the DER encoding of one certificate, whole and canonical.
+  CertificateImpl(const std::uint8_t *data, std::size_t length);
+
+  const std::vector<std::uint8_t> &GetDer() const noexcept override { return m_der; }
+  std::string GetSubject() const override;
+  std::string GetIssuer() const override;
+  std::string GetSha256Thumbprint() const override;
+  System::DateTime GetNotBefore() const override { return System::DateTimeFromUtc(m_notBefore, false); }
+  System::DateTime GetNotAfter() const override { return System::DateTimeFromUtc(m_notAfter, false); }
+  std::string ToPem() const override;
+
+  KeyKind GetKeyKind() const noexcept { return m_keyKind; }
+  unsigned GetKeyBits() const noexcept { return m_keyBits; }
+  VerifyContexts &GetVerifyContexts() const noexcept { return m_verifyContexts; }
+
+  /// Owned by the certificate. The key is null when OpenSSL does not know its algorithm.
+  X509 *GetNative() const noexcept { return m_native.get(); }
+  EVP_PKEY *GetNativeKey() const noexcept { return m_nativeKey; }
+
+private:
+  ~CertificateImpl() override = default;
+
+  std::vector<std::uint8_t> m_der;
+  CertificateHandle m_native;
+  EVP_PKEY *m_nativeKey = nullptr; // owned by m_native
+  KeyKind m_keyKind = KeyKind::OTHER;
+  unsigned m_keyBits = 0;
+  std::int64_t m_notBefore = 0; // microseconds since the epoch
+  std::int64_t m_notAfter = 0;
+  mutable VerifyContexts m_verifyContexts;
+};
+
+/// `certificate` as what it is.
+/// @throws TypeMismatchException when it is a class of someone else's.
+const CertificateImpl &AsImpl(const Certificate &certificate);
+
+} // namespace Tarvel::Crypto

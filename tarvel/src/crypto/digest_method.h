@@ -1,0 +1,17 @@
+// SPDX-License-Identifier: Apache-2.0
+/// @file
+/// OpenSSL's implementation of each digest algorithm, looked up once in the life of the process.
+
+#pragma once
+
+#include "crypto/digest.h"
+
+#include <openssl/types.h>
+
+namespace Tarvel::Crypto {
+
+/// Never null, never freed. Safe on any thread; after the first call it costs one load.
+/// @throws CryptoException when the cryptographic library does not offer the algorithm.
+const EVP_MD *GetDigestMethod(DigestAlgorithm algorithm);
+
+} // namespace Tarvel::Crypto

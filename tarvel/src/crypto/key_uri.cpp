@@ -1,0 +1,104 @@
+// SPDX-License-Identifier: Apache-2.0
+
+#include "crypto/key_uri.h"
+
+#include "crypto/openssl_errors.h"
+#include "crypto/openssl_handles.h"
+#include "crypto/passphrase.h"
+#include "crypto/private_key_impl.h"
+
+#include <openssl/err.h>
+
+#include <algorithm>
+#include <exception>
+#include <new>
+
+namespace Tarvel::Crypto {
+
+namespace {
+
+constexpr std::string_view SCHEME_LETTERS = "ABCDEFGHIJKLMNOPQRSTUVWXYZabcdefghijklmnopqrstuvwxyz";
+constexpr std::string_view SCHEME_CHARACTERS = "ABCDEFGHIJKLMNOPQRSTUVWXYZabcdefghijklmnopqrstuvwxyz0123456789+-.";
+
+// What a store's loader asks us, and what came of it: no exception may cross OpenSSL's frames.
+struct PassphraseQuestion {
+  Passphrase passphrase;
+  bool asked = false;
+  std::exception_ptr failure;
+};
+
+int AnswerPassphrase(char *buffer, int size, int, void *data) noexcept {
+  auto &question = *static_cast<PassphraseQuestion *>(data);
+  question.asked = true;
+  try {
+    const std::string &text = question.passphrase.Get();
+    if (text.size() > static_cast<std::size_t>(size)) {
+      return -1;
+    }
+    std::copy(text.begin(), text.end(), buffer);
+    return static_cast<int>(text.size());
+  } catch (...) {
+    question.failure = std::current_exception();
+    return -1;
+  }
+}
+
+[[noreturn]] void ThrowStoreFailure(const OpenSslErrorScope &errors, const PassphraseQuestion &question) {
+  if (question.failure) {
+    std::rethrow_exception(question.failure);
+  }
+  if (question.asked) {
+    throw WrongPassphraseException(errors.Describe("The passphrase of the private key is wrong"));
+  }
+  errors.Throw("The key store cannot be read");
+}
+
+// Null at the end of the store.
+KeyHandle LoadNextKey(OSSL_STORE_CTX *store, const OpenSslErrorScope &errors, const PassphraseQuestion &question) {
+  while (!OSSL_STORE_eof(store)) {
+    const StoreInfoHandle info(OSSL_STORE_load(store));
+    if (!info && (OSSL_STORE_error(store) || question.failure)) {
+      ThrowStoreFailure(errors, question);
+    }
+    if (info && OSSL_STORE_INFO_get_type(info.get()) == OSSL_STORE_INFO_PKEY) {
+      return KeyHandle(OSSL_STORE_INFO_get1_PKEY(info.get()));
+    }
+  }
+  return nullptr;
+}
+
+} // namespace
+
+bool IsKeyUri(const std::string &text) {
+  const std::size_t colon = text.find(':');
+  if (colon == std::string::npos || colon < 2) {
+    return false;
+  }
+  const std::string_view scheme = std::string_view(text).substr(0, colon);
+  return SCHEME_LETTERS.find(scheme.front()) != std::string_view::npos &&
+         scheme.find_first_not_of(SCHEME_CHARACTERS) == std::string_view::npos;
+}
+
+Ref<const PrivateKey> LoadPrivateKeyFromUri(const std::string &uri, const PassphraseCallback &passphrase) {
+  const OpenSslErrorScope errors;
+  PassphraseQuestion question{Passphrase(passphrase), false, nullptr};
+  // Without a method of ours, a loader would ask on the terminal of the host.
+  const UiMethodHandle ui(UI_UTIL_wrap_read_pem_callback(AnswerPassphrase, 0));
+  if (!ui) {
+    throw std::bad_alloc();
+  }
+  const StoreHandle store(OSSL_STORE_open(uri.c_str(), ui.get(), &question, nullptr, nullptr));
+  if (!store || OSSL_STORE_expect(store.get(), OSSL_STORE_INFO_PKEY) != 1) {
+    ThrowStoreFailure(errors, question);
+  }
+  KeyHandle key = LoadNextKey(store.get(), errors, question);
+  if (!key && question.asked) {
+    ThrowStoreFailure(errors, question);
+  }
+  if (!key) {
+    throw NoKeyException("There is no private key in the store");
+  }
+  return MakeRef<PrivateKeyImpl>(std::move(key));
+}
+
+} // namespace Tarvel::Crypto

@@ -1,0 +1,21 @@
+// SPDX-License-Identifier: Apache-2.0
+/// @file
+/// Private keys in the stores that OpenSSL's loaders open by URI.
+
+#pragma once
+
+#include <tarvel/crypto/private_key.h>
+
+#include <string>
+
+namespace Tarvel::Crypto {
+
+/// Whether `text` begins with an URI scheme (RFC 3986, section 3.1) of two or more characters and a colon. A file of
+/// such a name is written "./name".
+bool IsKeyUri(const std::string &text);
+
+/// @throws NoKeyException, WrongPassphraseException, CryptoException, IOException as `LoadPrivateKey`, without the URI
+/// in the message.
+Ref<const PrivateKey> LoadPrivateKeyFromUri(const std::string &uri, const PassphraseCallback &passphrase);
+
+} // namespace Tarvel::Crypto

@@ -1,0 +1,34 @@
+// SPDX-License-Identifier: Apache-2.0
+/// @file
+/// Where OpenSSL's errors become ours: a scope that keeps the calling thread's error queue as the host left it.
+
+#pragma once
+
+#include <string>
+
+namespace Tarvel::Crypto {
+
+/// Around calls of OpenSSL. What they put on the calling thread's error queue is gone when the scope ends; what was
+/// there before stays.
+class OpenSslErrorScope {
+public:
+  OpenSslErrorScope() noexcept;
+  OpenSslErrorScope(const OpenSslErrorScope &) = delete;
+  OpenSslErrorScope &operator=(const OpenSslErrorScope &) = delete;
+  ~OpenSslErrorScope();
+
+  /// OpenSSL's own words for all errors since the scope began, oldest first, which takes them off the queue. When the
+  /// host had left errors there, only the newest, for the older ones cannot be read without taking the host's.
+  std::string TakeText() const;
+
+  /// @throws CryptoException with `message`, followed by ": " and `TakeText` when there is any.
+  [[noreturn]] void Throw(const std::string &message) const;
+
+  /// `message` as `Throw` writes it.
+  std::string Describe(const std::string &message) const;
+
+private:
+  const bool m_hostHadErrors;
+};
+
+} // namespace Tarvel::Crypto

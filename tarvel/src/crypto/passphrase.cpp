@@ -1,0 +1,26 @@
+// SPDX-License-Identifier: Apache-2.0
+
+#include "crypto/passphrase.h"
+
+#include <tarvel/core/secure_wipe.h>
+
+namespace Tarvel::Crypto {
+
+Passphrase::~Passphrase() {
+  SecureWipe(m_text);
+}
+
+const std::string &Passphrase::Get() {
+  if (!m_ask) {
+    throw WrongPassphraseException("The private key is encrypted and there is no passphrase");
+  }
+  if (!m_asked) {
+    m_asked = true;
+    std::string answer = m_ask();
+    m_text.assign(answer);
+    SecureWipe(answer); // a short text is not moved but copied: what is left of the answer is a secret too
+  }
+  return m_text;
+}
+
+} // namespace Tarvel::Crypto

@@ -1,0 +1,38 @@
+// SPDX-License-Identifier: Apache-2.0
+
+#include "crypto/private_key_impl.h"
+
+#include "crypto/openssl_errors.h"
+
+#include <typeinfo>
+#include <utility>
+
+namespace Tarvel::Crypto {
+
+PrivateKeyImpl::PrivateKeyImpl(KeyHandle native) : m_native(std::move(native)) {
+  const OpenSslErrorScope errors;
+  if (EVP_PKEY_is_a(m_native.get(), "RSA") || EVP_PKEY_is_a(m_native.get(), "EC")) {
+    return;
+  }
+  const char *const algorithm = EVP_PKEY_get0_type_name(m_native.get());
+  throw CryptoException(std::string("Private key of algorithm ") + (algorithm ? algorithm : "unknown") +
+                        ", which is neither RSA nor EC");
+}
+
+std::string PrivateKeyImpl::GetAlgorithm() const {
+  return EVP_PKEY_is_a(m_native.get(), "RSA") ? "RSA" : "EC";
+}
+
+unsigned PrivateKeyImpl::GetBits() const {
+  return static_cast<unsigned>(EVP_PKEY_get_bits(m_native.get()));
+}
+
+const PrivateKeyImpl &AsImpl(const PrivateKey &key) {
+  const auto *const impl = dynamic_cast<const PrivateKeyImpl *>(&key);
+  if (!impl) {
+    ThrowTypeMismatch(typeid(PrivateKeyImpl).name(), typeid(key).name());
+  }
+  return *impl;
+}
+
+} // namespace Tarvel::Crypto

@@ -1,0 +1,34 @@
+// SPDX-License-Identifier: Apache-2.0
+/// @file
+/// The one implementation of `PrivateKey`, over OpenSSL's.
+
+#pragma once
+
+#include "crypto/openssl_handles.h"
+
+#include <tarvel/crypto/private_key.h>
+
+namespace Tarvel::Crypto {
+
+class PrivateKeyImpl final : public PrivateKey {
+public:
+  /// @throws CryptoException when the key is neither RSA nor EC.
+  explicit PrivateKeyImpl(KeyHandle native);
+
+  std::string GetAlgorithm() const override;
+  unsigned GetBits() const override;
+
+  /// Owned by the key; OpenSSL counts its own references to it.
+  EVP_PKEY *GetNative() const noexcept { return m_native.get(); }
+
+private:
+  ~PrivateKeyImpl() override = default;
+
+  KeyHandle m_native; // OpenSSL wipes the numbers when it frees them
+};
+
+/// `key` as what it is.
+/// @throws TypeMismatchException when it is a class of someone else's.
+const PrivateKeyImpl &AsImpl(const PrivateKey &key);
+
+} // namespace Tarvel::Crypto

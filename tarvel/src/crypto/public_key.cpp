@@ -1,0 +1,167 @@
+// SPDX-License-Identifier: Apache-2.0
+
+#include "crypto/public_key.h"
+
+#include "crypto/certificate_impl.h"
+#include "crypto/digest_method.h"
+#include "crypto/openssl_errors.h"
+#include "crypto/openssl_handles.h"
+#include "crypto/private_key_impl.h"
+
+#include <openssl/rsa.h>
+
+#include <string>
+#include <utility>
+
+namespace Tarvel::Crypto {
+
+namespace {
+
+constexpr unsigned BITS_PER_BYTE = 8;
+
+bool IsRsaScheme(SignatureScheme scheme) {
+  return scheme != SignatureScheme::ECDSA;
+}
+
+bool IsCurve(KeyKind kind) {
+  return kind == KeyKind::EC_P256 || kind == KeyKind::EC_P384 || kind == KeyKind::EC_P521;
+}
+
+bool FitsScheme(KeyKind kind, SignatureScheme scheme) {
+  return IsRsaScheme(scheme) ? kind == KeyKind::RSA : IsCurve(kind);
+}
+
+// The octets of the modulus, or of r and s each: the curve's order rounded up (66 for P-521).
+std::size_t BytesOf(unsigned bits) {
+  return (bits + BITS_PER_BYTE - 1) / BITS_PER_BYTE;
+}
+
+// What follows EVP_PKEY_sign_init or EVP_PKEY_verify_init.
+bool SetScheme(EVP_PKEY_CTX *context, SignatureScheme scheme, DigestAlgorithm algorithm) {
+  const EVP_MD *const method = GetDigestMethod(algorithm);
+  if (EVP_PKEY_CTX_set_signature_md(context, method) <= 0) {
+    return false;
+  }
+  switch (scheme) {
+  case SignatureScheme::RSA_PKCS1:
+    return EVP_PKEY_CTX_set_rsa_padding(context, RSA_PKCS1_PADDING) > 0;
+  case SignatureScheme::RSA_PSS:
+    return EVP_PKEY_CTX_set_rsa_padding(context, RSA_PKCS1_PSS_PADDING) > 0 &&
+           EVP_PKEY_CTX_set_rsa_mgf1_md(context, method) > 0 &&
+           EVP_PKEY_CTX_set_rsa_pss_saltlen(context, RSA_PSS_SALTLEN_DIGEST) > 0;
+  case SignatureScheme::ECDSA:
+    break;
+  }
+  return true;
+}
+
+KeyContextHandle NewVerifyContext(EVP_PKEY *key, SignatureScheme scheme, DigestAlgorithm algorithm) {
+  const OpenSslErrorScope errors;
+  KeyContextHandle context(EVP_PKEY_CTX_new_from_pkey(nullptr, key, nullptr));
+  if (!context || EVP_PKEY_verify_init(context.get()) <= 0 || !SetScheme(context.get(), scheme, algorithm)) {
+    errors.Throw("Failed to set up a signature check");
+  }
+  return context;
+}
+
+BignumHandle ReadNumber(const std::uint8_t *bytes, std::size_t length) {
+  return BignumHandle(BN_bin2bn(bytes, static_cast<int>(length), nullptr));
+}
+
+// OpenSSL takes ECDSA values as a DER sequence of r and s, XML Signature as their octets side by side.
+std::vector<std::uint8_t> EncodeEcdsaValue(const std::uint8_t *value, std::size_t numberBytes) {
+  const OpenSslErrorScope errors;
+  BignumHandle r = ReadNumber(value, numberBytes);
+  BignumHandle s = ReadNumber(value + numberBytes, numberBytes);
+  const EcdsaSignatureHandle pair(ECDSA_SIG_new());
+  if (!r || !s || !pair || ECDSA_SIG_set0(pair.get(), r.get(), s.get()) != 1) {
+    errors.Throw("Failed to encode an ECDSA value");
+  }
+  static_cast<void>(r.release()); // the pair owns them now
+  static_cast<void>(s.release());
+  unsigned char *der = nullptr;
+  const int length = i2d_ECDSA_SIG(pair.get(), &der);
+  const MemoryHandle owner(der);
+  if (length <= 0) {
+    errors.Throw("Failed to encode an ECDSA value");
+  }
+  return {der, der + length};
+}
+
+std::vector<std::uint8_t> DecodeEcdsaValue(const std::vector<std::uint8_t> &der, std::size_t numberBytes) {
+  const OpenSslErrorScope errors;
+  const unsigned char *position = der.data();
+  const EcdsaSignatureHandle pair(d2i_ECDSA_SIG(nullptr, &position, static_cast<long>(der.size())));
+  std::vector<std::uint8_t> value(2 * numberBytes);
+  const int width = static_cast<int>(numberBytes);
+  if (!pair || BN_bn2binpad(ECDSA_SIG_get0_r(pair.get()), value.data(), width) != width ||
+      BN_bn2binpad(ECDSA_SIG_get0_s(pair.get()), value.data() + numberBytes, width) != width) {
+    errors.Throw("Failed to decode an ECDSA value");
+  }
+  return value;
+}
+
+bool Verify(EVP_PKEY_CTX *context, DigestAlgorithm algorithm, const std::uint8_t *digest, const std::uint8_t *signature,
+            std::size_t signatureLength) {
+  const OpenSslErrorScope errors;
+  const int answer = EVP_PKEY_verify(context, signature, signatureLength, digest, DigestBytes(algorithm));
+  if (answer < 0) {
+    errors.Throw("Failed to check a signature");
+  }
+  return answer == 1;
+}
+
+} // namespace
+
+KeyKind GetKeyKind(const Certificate &certificate, unsigned &bits) {
+  const CertificateImpl &impl = AsImpl(certificate);
+  bits = impl.GetKeyBits();
+  return impl.GetKeyKind();
+}
+
+bool VerifyDigest(const Certificate &certificate, SignatureScheme scheme, DigestAlgorithm algorithm,
+                  const std::uint8_t *digest, const std::uint8_t *signature, std::size_t signatureLength) {
+  const CertificateImpl &impl = AsImpl(certificate);
+  const std::size_t numberBytes = BytesOf(impl.GetKeyBits());
+  const std::size_t expectedLength = IsRsaScheme(scheme) ? numberBytes : 2 * numberBytes;
+  if (!FitsScheme(impl.GetKeyKind(), scheme) || signatureLength != expectedLength) {
+    return false;
+  }
+  VerifyContexts &contexts = impl.GetVerifyContexts();
+  KeyContextHandle context = contexts.Take(scheme, algorithm);
+  if (!context) {
+    context = NewVerifyContext(impl.GetNativeKey(), scheme, algorithm);
+  }
+  bool genuine = false;
+  if (IsRsaScheme(scheme)) {
+    genuine = Verify(context.get(), algorithm, digest, signature, signatureLength);
+  } else {
+    const std::vector<std::uint8_t> der = EncodeEcdsaValue(signature, numberBytes);
+    genuine = Verify(context.get(), algorithm, digest, der.data(), der.size());
+  }
+  contexts.Put(scheme, algorithm, std::move(context));
+  return genuine;
+}
+
+std::vector<std::uint8_t> SignDigest(const PrivateKey &key, SignatureScheme scheme, DigestAlgorithm algorithm,
+                                     const std::uint8_t *digest) {
+  const OpenSslErrorScope errors;
+  if (key.GetAlgorithm() != (IsRsaScheme(scheme) ? "RSA" : "EC")) {
+    throw CryptoException("A key of algorithm " + key.GetAlgorithm() + " cannot make a signature of this scheme");
+  }
+  EVP_PKEY *const native = AsImpl(key).GetNative();
+  const KeyContextHandle context(EVP_PKEY_CTX_new_from_pkey(nullptr, native, nullptr));
+  std::size_t length = 0;
+  if (!context || EVP_PKEY_sign_init(context.get()) <= 0 || !SetScheme(context.get(), scheme, algorithm) ||
+      EVP_PKEY_sign(context.get(), nullptr, &length, digest, DigestBytes(algorithm)) <= 0) {
+    errors.Throw("Failed to set up a signature");
+  }
+  std::vector<std::uint8_t> value(length);
+  if (EVP_PKEY_sign(context.get(), value.data(), &length, digest, DigestBytes(algorithm)) <= 0) {
+    errors.Throw("Failed to sign");
+  }
+  value.resize(length);
+  return IsRsaScheme(scheme) ? value : DecodeEcdsaValue(value, BytesOf(key.GetBits()));
+}
+
+} // namespace Tarvel::Crypto
