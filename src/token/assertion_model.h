@@ -1,0 +1,116 @@
+// SPDX-License-Identifier: Apache-2.0
+/// @file
+/// The parsed form of one SAML 2.0 assertion: a record for each schema type of the accepted profile.
+///
+/// The records, and their fields, are named after the schema's types, elements and attributes. The parser fills them, the
+/// checks and the token read them; they live only while a token is made.
+
+#pragma once
+
+#include <ssoclient/advice.h>
+#include <ssoclient/saml_token.h>
+#include <tarvel/core/ref.h>
+#include <tarvel/crypto/certificate.h>
+#include <tarvel/system/date_time.h>
+#include <tarvel/xml/security/signature.h>
+
+#include <boost/optional.hpp>
+
+#include <cstdint>
+#include <set>
+#include <string>
+#include <vector>
+
+namespace SsoClient {
+
+struct NameIDType {
+  std::string Format;
+  std::string value; ///< the element's text
+
+  friend bool operator==(const NameIDType &, const NameIDType &) = default;
+};
+
+struct SubjectConfirmationDataType {
+  Tarvel::System::DateTime NotOnOrAfter;                      ///< set for bearer
+  Tarvel::Ref<const Tarvel::Crypto::Certificate> certificate; ///< set for holder-of-key
+};
+
+struct SubjectConfirmationType {
+  SamlToken::ConfirmationType Method = SamlToken::BEARER;
+  boost::optional<NameIDType> NameID; ///< the delegate that confirms the subject
+  SubjectConfirmationDataType SubjectConfirmationData;
+};
+
+struct SubjectType {
+  NameIDType NameID;
+  SubjectConfirmationType SubjectConfirmation;
+};
+
+struct RenewRestrictionType {
+  boost::optional<std::uint64_t> Count;
+};
+
+struct ProxyRestrictionType {
+  boost::optional<std::uint64_t> Count;
+};
+
+struct DelegateType {
+  Tarvel::System::DateTime DelegationInstant;
+  NameIDType NameID;
+};
+
+struct DelegationRestrictionType {
+  std::vector<DelegateType> delegates; ///< in document order, at least one
+};
+
+struct AudienceRestrictionType {
+  std::set<std::string> audiences;
+};
+
+struct ConditionsType {
+  Tarvel::System::DateTime NotBefore;
+  Tarvel::System::DateTime NotOnOrAfter;
+  boost::optional<RenewRestrictionType> RenewRestriction;
+  boost::optional<DelegationRestrictionType> DelegationRestriction;
+  boost::optional<AudienceRestrictionType> AudienceRestriction;
+  boost::optional<ProxyRestrictionType> ProxyRestriction;
+};
+
+struct AdviceType {
+  std::vector<Advice> advice; ///< one for each RSAAdvice, in document order
+};
+
+struct AuthnContextType {
+  std::string AuthnContextClassRef;
+};
+
+struct AuthnStatementType {
+  Tarvel::System::DateTime AuthnInstant;
+  AuthnContextType AuthnContext;
+};
+
+struct AttributeType {
+  std::string Name;
+  std::string NameFormat;          ///< empty when absent
+  std::string FriendlyName;        ///< empty when absent
+  std::vector<std::string> values; ///< one for each AttributeValue, in document order
+};
+
+struct AttributeStatementType {
+  std::vector<AttributeType> attributes; ///< in document order
+};
+
+struct SamlAssertionType {
+  std::string Version;
+  std::string ID;
+  Tarvel::System::DateTime IssueInstant;
+  NameIDType Issuer;
+  Tarvel::Ref<Tarvel::Xml::Security::Signature> Signature;
+  SubjectType Subject;
+  ConditionsType Conditions;
+  boost::optional<AdviceType> Advice;
+  AuthnStatementType AuthnStatement;
+  boost::optional<AttributeStatementType> AttributeStatement;
+};
+
+} // namespace SsoClient

@@ -1,0 +1,35 @@
+// SPDX-License-Identifier: Apache-2.0
+/// @file
+/// Readers of the conditions under which a token is valid.
+///
+/// A `TryParse` function answers whether the cursor stood on its element; when it did not, cursor and record are left alone.
+
+#pragma once
+
+#include "token/assertion_model.h"
+#include "xml/node_filter_iterator.h"
+
+#include <boost/optional.hpp>
+
+namespace SsoClient {
+
+/// Reads a `saml:Conditions`: its restrictions in any order, each at most once.
+void ParseConditionsElement(NodeFilterIterator &iterator, ConditionsType &conditions);
+
+/// Reads a `saml:Condition` of the type DelegationRestrictionType.
+bool TryParseDelegationRestriction(NodeFilterIterator &iterator,
+                                   boost::optional<DelegationRestrictionType> &restriction);
+
+/// Reads a `Delegate` of the delegation restriction.
+void ParseDelegate(NodeFilterIterator &iterator, DelegateType &delegate);
+
+/// Reads a `saml:AudienceRestriction`.
+bool TryParseAudienceRestriction(NodeFilterIterator &iterator, boost::optional<AudienceRestrictionType> &restriction);
+
+/// Reads a `saml:ProxyRestriction`.
+bool TryParseProxyRestriction(NodeFilterIterator &iterator, boost::optional<ProxyRestrictionType> &restriction);
+
+/// Reads a `saml:Condition` of the type RenewRestrictionType.
+bool TryParseRenewRestriction(NodeFilterIterator &iterator, boost::optional<RenewRestrictionType> &restriction);
+
+} // namespace SsoClient

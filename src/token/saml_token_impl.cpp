@@ -1,0 +1,126 @@
+// SPDX-License-Identifier: Apache-2.0
+#include "token/saml_token_impl.h"
+
+#include "token/assertion_parser.h"
+#include "token/token_checks.h"
+#include "token/token_facts.h"
+#include "xml/parse_xml.h"
+
+#include <ssoclient/exceptions.h>
+#include <tarvel/io/writer.h>
+#include <tarvel/xml/security/canonicalizer.h>
+#include <tarvel/xml/security/exceptions.h>
+
+#include <memory>
+#include <utility>
+
+namespace SsoClient {
+
+namespace {
+
+using Tarvel::Ref;
+using Tarvel::Xml::Document;
+using Tarvel::Xml::ElementNode;
+using Tarvel::Xml::Security::KeyInfoResolver;
+using Tarvel::Xml::Security::Signature;
+
+// The published URI has no "#" at its end; the canonicalizer knows this spelling as the same algorithm.
+constexpr const char *CANONICAL_XML = "http://www.w3.org/TR/2001/REC-xml-c14n-20010315#";
+
+std::string Canonicalize(const ElementNode &element) {
+  const Ref<Tarvel::StringWriter> writer = Tarvel::CreateStringWriter();
+  Tarvel::Xml::Security::CreateCanonicalizer(CANONICAL_XML)->Canonicalize(element, *writer);
+  return writer->TakeText();
+}
+
+/// Whether a restriction allows it at least once more. One without a number allows nothing.
+template <typename Restriction>
+bool Allows(const boost::optional<Restriction> &restriction) {
+  return restriction && restriction->Count && *restriction->Count != 0;
+}
+
+} // namespace
+
+SamlTokenImpl::SamlTokenImpl(const std::string &xml, const KeyInfoResolver &resolver, std::int64_t clockToleranceSec)
+    : m_xml(xml) {
+  Ref<Document> document;
+  ParseXML(xml, document);
+  InitializeFromDom(document ? document->GetDocumentElement() : nullptr, resolver, clockToleranceSec);
+}
+
+SamlTokenImpl::SamlTokenImpl(const ElementNode &element, const KeyInfoResolver &resolver,
+                             std::int64_t clockToleranceSec)
+    : m_xml(Canonicalize(element)) {
+  InitializeFromDom(&element, resolver, clockToleranceSec);
+}
+
+void SamlTokenImpl::InitializeFromDom(const ElementNode *element, const KeyInfoResolver &resolver,
+                                      std::int64_t clockToleranceSec) {
+  NodeFilterIterator iterator(element, std::make_shared<SkipWsAndCommentsFilter>());
+  SamlAssertionType assertion;
+  ParseSamlAssertionElement(iterator, assertion);
+  CheckTokenProperties(assertion, clockToleranceSec);
+  ValidateSignature(*assertion.Signature, resolver);
+
+  m_id = std::move(assertion.ID);
+  PopulateSubject(assertion.Subject);
+  if (assertion.Advice) {
+    m_advice = std::move(assertion.Advice->advice);
+  }
+  if (assertion.AttributeStatement) {
+    for (const AttributeType &attribute : assertion.AttributeStatement->attributes) {
+      PopulateTokenAttribute(attribute);
+    }
+  }
+  PopulateConditions(assertion.Conditions);
+}
+
+void SamlTokenImpl::ValidateSignature(const Signature &signature, const KeyInfoResolver &resolver) {
+  bool verified = false;
+  try {
+    std::set<std::string> signedUris;
+    verified = signature.Verify(resolver, signedUris);
+  } catch (const Tarvel::Xml::Security::XmlSecurityException &error) {
+    throw InvalidSignatureException(std::string("Signature verification error. ") + error.what());
+  }
+  if (!verified) {
+    throw InvalidSignatureException("Failed to verify signature: token might have been tampered with.");
+  }
+}
+
+void SamlTokenImpl::PopulateSubject(SubjectType &subject) {
+  m_subject = ParseSamlNameId(subject.NameID);
+  m_confirmationMethod = subject.SubjectConfirmation.Method;
+  m_confirmationCertificate = std::move(subject.SubjectConfirmation.SubjectConfirmationData.certificate);
+}
+
+void SamlTokenImpl::PopulateConditions(ConditionsType &conditions) {
+  m_startDate = conditions.NotBefore;
+  m_endDate = conditions.NotOnOrAfter;
+  m_renewable = Allows(conditions.RenewRestriction);
+  m_delegable = Allows(conditions.ProxyRestriction);
+  if (conditions.DelegationRestriction) {
+    for (const DelegateType &delegate : conditions.DelegationRestriction->delegates) {
+      m_delegationChain.push_back(ParseToDelegate(delegate));
+    }
+  }
+  if (conditions.AudienceRestriction) {
+    m_audience = std::move(conditions.AudienceRestriction->audiences);
+  }
+}
+
+void SamlTokenImpl::PopulateTokenAttribute(const AttributeType &attribute) {
+  if (SamlAttributeIsGroupIdentity(attribute)) {
+    for (const std::string &value : attribute.values) {
+      m_groups.push_back(ParseGroupIdentity(value));
+    }
+  } else if (SamlAttributeIsSolution(attribute)) {
+    m_solution = ParseIsSolutionAttribute(attribute);
+  } else if (SamlAttributeIsGivenName(attribute)) {
+    m_fullName.first = ParsePrincipalNameAttribute(attribute);
+  } else if (SamlAttributeIsSurName(attribute)) {
+    m_fullName.second = ParsePrincipalNameAttribute(attribute);
+  }
+}
+
+} // namespace SsoClient

@@ -1,0 +1,32 @@
+// SPDX-License-Identifier: Apache-2.0
+/// @file
+/// Readers of what an assertion states: advice, authentication and attributes.
+
+#pragma once
+
+#include "token/assertion_model.h"
+#include "xml/node_filter_iterator.h"
+
+#include <boost/optional.hpp>
+
+namespace SsoClient {
+
+/// Reads a `saml:Advice`. Answers whether the cursor stood on one; when it did not, cursor and record are left alone.
+bool TryParseAdviceElement(NodeFilterIterator &iterator, boost::optional<AdviceType> &advice);
+
+/// Reads an `RSAAdvice`, the advice of one source.
+void ParseRsaAdviceElement(NodeFilterIterator &iterator, Advice &advice);
+
+/// Reads a `saml:AuthnStatement`.
+void ParseAuthnStatementElement(NodeFilterIterator &iterator, AuthnStatementType &statement);
+
+/// Reads a `saml:AuthnContext`.
+void ParseAuthnContextElement(NodeFilterIterator &iterator, AuthnContextType &context);
+
+/// Reads a `saml:AttributeStatement`.
+void ParseAttributeStatementElement(NodeFilterIterator &iterator, AttributeStatementType &statement);
+
+/// Reads a `saml:Attribute`.
+void ParseAttributeElement(NodeFilterIterator &iterator, AttributeType &attribute);
+
+} // namespace SsoClient

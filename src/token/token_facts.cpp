@@ -1,0 +1,84 @@
+// SPDX-License-Identifier: Apache-2.0
+#include "token/token_facts.h"
+
+#include <ssoclient/exceptions.h>
+#include <tarvel/core/message_formatter.h>
+#include <tarvel/core/string_util.h>
+
+#include <string_view>
+
+namespace SsoClient {
+
+namespace {
+
+using Tarvel::MessageFormatter;
+
+constexpr std::string_view GROUP_IDENTITY = SSOCLIENT_EXTENSION_AUTHORITY "/schemas/attr-names/2009/01/GroupIdentity";
+constexpr std::string_view IS_SOLUTION = SSOCLIENT_SOLUTION_AUTHORITY "/schemas/attr-names/2011/07/isSolution";
+constexpr std::string_view GIVEN_NAME = "http://schemas.xmlsoap.org/ws/2005/05/identity/claims/givenname";
+constexpr std::string_view SUR_NAME = "http://schemas.xmlsoap.org/ws/2005/05/identity/claims/surname";
+constexpr std::string_view FORMAT_UPN = "http://schemas.xmlsoap.org/claims/UPN";
+
+/// Whether `separator`, a position in `text` or npos, has something on both sides.
+bool PartsInTwo(const std::string &text, std::size_t separator) {
+  return separator != std::string::npos && separator != 0 && separator + 1 != text.size();
+}
+
+} // namespace
+
+bool SamlAttributeIsGroupIdentity(const AttributeType &attribute) {
+  return attribute.Name == GROUP_IDENTITY;
+}
+
+bool SamlAttributeIsSolution(const AttributeType &attribute) {
+  return attribute.Name == IS_SOLUTION;
+}
+
+bool SamlAttributeIsGivenName(const AttributeType &attribute) {
+  return attribute.Name == GIVEN_NAME;
+}
+
+bool SamlAttributeIsSurName(const AttributeType &attribute) {
+  return attribute.Name == SUR_NAME;
+}
+
+PrincipalId ParseGroupIdentity(const std::string &value) {
+  const std::size_t backslash = value.find('\\');
+  if (!PartsInTwo(value, backslash)) {
+    throw ParseException(
+        MessageFormatter::ASPrint("Failed to parse Group Identity value: `%1'; domain or group missing", value));
+  }
+  return {value.substr(backslash + 1), value.substr(0, backslash)};
+}
+
+PrincipalId ParseSamlNameId(const NameIDType &nameId) {
+  if (nameId.Format != FORMAT_UPN) {
+    throw ParseException(MessageFormatter::ASPrint("Invalid or unsupported NameId format '%1'", nameId.Format));
+  }
+  const std::size_t atSign = nameId.value.rfind('@');
+  if (!PartsInTwo(nameId.value, atSign)) {
+    throw ParseException(MessageFormatter::ASPrint(
+        "Failed to parse the UPN NameID: `%1'; name or domain part is missing.", nameId.value));
+  }
+  return {nameId.value.substr(0, atSign), nameId.value.substr(atSign + 1)};
+}
+
+bool ParseIsSolutionAttribute(const AttributeType &attribute) {
+  if (attribute.values.empty()) {
+    throw ParseException("No value found for attribute isSolution.");
+  }
+  if (attribute.values.size() > 1) {
+    throw ParseException("More than one value found for attribute isSolution.");
+  }
+  return Tarvel::StringUtil::ToLower(attribute.values.front()) == "true";
+}
+
+std::string ParsePrincipalNameAttribute(const AttributeType &attribute) {
+  return attribute.values.empty() ? std::string() : attribute.values.front();
+}
+
+Delegate ParseToDelegate(const DelegateType &delegate) {
+  return {ParseSamlNameId(delegate.NameID), delegate.DelegationInstant};
+}
+
+} // namespace SsoClient
