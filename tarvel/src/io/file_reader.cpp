@@ -50,7 +50,7 @@ public:
 int OpenForReading(const std::string &path) {
   // A path is a C string to the system: what follows a NUL would be dropped without a word.
   if (path.find('\0') != std::string::npos) {
-    ThrowFor("open", path, EINVAL);
+    ThrowFor("open", path.c_str(), EINVAL);
   }
   for (;;) {
     const int descriptor = ::open(path.c_str(), O_RDONLY | O_CLOEXEC);

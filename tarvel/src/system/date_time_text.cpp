@@ -4,6 +4,7 @@
 
 #include <tarvel/core/exception.h>
 
+#include <algorithm>
 #include <string>
 
 namespace Tarvel {
@@ -139,9 +140,13 @@ DateTimeFields ParseDateTimeText(std::string_view text) {
 }
 
 void RefuseDateTimeText(std::string_view text, std::string_view reason) {
-  const bool quotedWhole = text.size() <= MAX_QUOTED_LENGTH;
-  throw DateTimeFormatException("\"" + std::string(text.substr(0, MAX_QUOTED_LENGTH)) + (quotedWhole ? "" : "...") +
-                                "\" is not a date-time: " + std::string(reason));
+  std::string quoted(text.substr(0, MAX_QUOTED_LENGTH));
+  // A message is read as a C string: a NUL would end it before its reason.
+  std::replace(quoted.begin(), quoted.end(), '\0', '?');
+  if (text.size() > MAX_QUOTED_LENGTH) {
+    quoted += "...";
+  }
+  throw DateTimeFormatException("\"" + quoted + "\" is not a date-time: " + std::string(reason));
 }
 
 } // namespace System

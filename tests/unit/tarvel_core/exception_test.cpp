@@ -1,0 +1,150 @@
+// SPDX-License-Identifier: Apache-2.0
+
+#include <tarvel/core/exception.h>
+
+#include <tarvel/core/checked_cast.h>
+
+#include <gtest/gtest.h>
+
+#include <exception>
+#include <memory>
+#include <thread>
+#include <type_traits>
+
+namespace Tarvel {
+namespace {
+
+template <typename T>
+std::string MessageOf(const T &action) {
+  try {
+    action();
+  } catch (const std::exception &error) {
+    return error.what();
+  }
+  return "nothing was raised";
+}
+
+template <typename T>
+class ExceptionClass : public testing::Test {};
+
+using ExceptionClasses =
+    testing::Types<Exception, InvalidArgumentException, InvalidStateException, TypeMismatchException,
+                   Base64FormatException, DateTimeFormatException, IOException>;
+TYPED_TEST_SUITE(ExceptionClass, ExceptionClasses);
+
+TYPED_TEST(ExceptionClass, IsAStandardException) {
+  EXPECT_TRUE((std::is_base_of_v<std::exception, TypeParam>));
+}
+
+TYPED_TEST(ExceptionClass, IsCopiedWithoutThrowing) {
+  EXPECT_TRUE(std::is_nothrow_copy_constructible_v<TypeParam>);
+  EXPECT_TRUE(std::is_nothrow_copy_assignable_v<TypeParam>);
+}
+
+TYPED_TEST(ExceptionClass, CloneOfABaseReferenceKeepsTheDynamicClassAndTheMessage) {
+  const TypeParam original("detail");
+  const Exception &held = original;
+  const std::unique_ptr<Exception> clone(held.Clone());
+  EXPECT_NE(clone.get(), &held);
+  EXPECT_TRUE(typeid(*clone) == typeid(TypeParam));
+  EXPECT_STREQ(clone->what(), original.what());
+  EXPECT_EQ(clone->GetBacktrace(), original.GetBacktrace());
+}
+
+TYPED_TEST(ExceptionClass, ThrowOfABaseReferenceRaisesTheDynamicClass) {
+  const TypeParam original("detail");
+  const Exception &held = original;
+  try {
+    held.Throw();
+  } catch (const Exception &raised) {
+    EXPECT_NE(&raised, &held);
+    EXPECT_TRUE(typeid(raised) == typeid(TypeParam));
+    EXPECT_STREQ(raised.what(), original.what());
+  }
+}
+
+TEST(Exception, KeepsTheMessageAsGiven) {
+  EXPECT_STREQ(Exception("a %1 message").what(), "a %1 message");
+  EXPECT_STREQ(Exception("").what(), "");
+}
+
+TEST(Exception, AssignmentTakesOverMessageAndOutlivesTheSource) {
+  Exception target("first");
+  {
+    const Exception source("second");
+    target = source;
+  }
+  EXPECT_STREQ(target.what(), "second");
+}
+
+TEST(Exception, MovedFromExceptionStillHasItsMessage) {
+  Exception source("kept");
+  const Exception target(std::move(source));
+  EXPECT_STREQ(source.what(), "kept");
+  EXPECT_STREQ(target.what(), "kept");
+}
+
+TEST(InvalidArgumentException, PutsItsPrefixBeforeTheDetailOnce) {
+  const InvalidArgumentException error("lifetime");
+  EXPECT_STREQ(error.what(), "Invalid argument : lifetime");
+  const std::unique_ptr<Exception> clone(error.Clone());
+  EXPECT_STREQ(clone->what(), "Invalid argument : lifetime");
+}
+
+TEST(Exception, BacktraceHasOneFrameALine) {
+  const std::string backtrace = Exception("x").GetBacktrace();
+  ASSERT_FALSE(backtrace.empty());
+  EXPECT_EQ(backtrace.back(), '\n');
+  EXPECT_EQ(backtrace.find("\n\n"), std::string::npos);
+}
+
+TEST(Exception, DumpNamesClassMessageAndCallStack) {
+  const IOException error("no such thing");
+  EXPECT_EQ(error.Dump(), "Tarvel::IOException: no such thing\n" + error.GetBacktrace());
+}
+
+TEST(Exception, WhereIsAFrameOfTheCallStack) {
+  const InvalidStateException error("x");
+  ASSERT_FALSE(error.Where().empty());
+  EXPECT_NE(error.GetBacktrace().find(error.Where() + '\n'), std::string::npos);
+}
+
+TEST(Exception, WhereIsNotTheExceptionsOwnConstructor) {
+  EXPECT_EQ(InvalidArgumentException("x").Where().find("InvalidArgumentException::"), std::string::npos);
+}
+
+TEST(Exception, CloneIsUsableOnAnotherThreadAfterTheOriginalIsGone) {
+  std::unique_ptr<Exception> clone;
+  {
+    const InvalidStateException original("handed over");
+    clone.reset(original.Clone());
+  }
+  std::string message;
+  std::thread([&] { message = MessageOf([&] { clone->Throw(); }); }).join();
+  EXPECT_EQ(message, "handed over");
+}
+
+class Fruit : public Object {};
+class Apple final : public Fruit {};
+class Pear final : public Fruit {};
+
+TEST(CheckedCast, GivesTheSameObjectAsItsClass) {
+  const Ref<Object> object = MakeRef<Apple>();
+  EXPECT_EQ(CheckedCast<Apple>(object).get(), object.get());
+  EXPECT_EQ(CheckedCast<Fruit>(object).get(), object.get());
+}
+
+TEST(CheckedCast, KeepsNull) {
+  EXPECT_FALSE(CheckedCast<Apple>(Ref<Object>()));
+}
+
+TEST(CheckedCast, NamesExpectedAndActualClass) {
+  const Ref<Object> object = MakeRef<Pear>();
+  EXPECT_THROW(CheckedCast<Apple>(object), TypeMismatchException);
+  EXPECT_EQ(MessageOf([&] { CheckedCast<Apple>(object); }),
+            "Type mismatch : expected Tarvel::(anonymous namespace)::Apple, but the object is "
+            "Tarvel::(anonymous namespace)::Pear");
+}
+
+} // namespace
+} // namespace Tarvel

@@ -1,0 +1,68 @@
+// SPDX-License-Identifier: Apache-2.0
+
+#include <tarvel/system/environment.h>
+
+#include <tarvel/core/string_util.h>
+#include <tarvel/system/date_time.h>
+
+#include <gtest/gtest.h>
+
+#include <limits>
+#include <thread>
+
+namespace Tarvel {
+namespace System {
+namespace {
+
+/// Later than any clock that this test can run under is likely to be.
+constexpr std::int64_t YEAR_3000 = 32'503'680'000'000'000;
+
+Environment Clock(std::int64_t now) {
+  return {[now] { return now; }, nullptr};
+}
+
+TEST(ScopedEnvironment, PutsItsClockAndUuidSourceInPlace) {
+  const ScopedEnvironment scope({[] { return std::int64_t{1'000'000}; }, [] { return std::string("uuid-1"); }});
+  EXPECT_EQ(GetUtcDateTime().ToString(), "1970-01-01T00:00:01.000Z");
+  EXPECT_EQ(StringUtil::GenerateUuid(), "uuid-1");
+}
+
+TEST(ScopedEnvironment, GivesTheRealSourcesBackAtItsEnd) {
+  {
+    const ScopedEnvironment scope({[] { return std::int64_t{0}; }, [] { return std::string("uuid-1"); }});
+  }
+  EXPECT_GT(GetUtcDateTime().GetUtcTime(), 0);
+  EXPECT_EQ(StringUtil::GenerateUuid().size(), 36U);
+}
+
+TEST(ScopedEnvironment, Nests) {
+  const ScopedEnvironment outer(Clock(1));
+  {
+    const ScopedEnvironment inner(Clock(2));
+    EXPECT_EQ(GetUtcDateTime().GetUtcTime(), 2);
+  }
+  EXPECT_EQ(GetUtcDateTime().GetUtcTime(), 1);
+}
+
+TEST(ScopedEnvironment, MeansTheRealSourceByAnEmptyFunctionAlsoInsideAnotherScope) {
+  const ScopedEnvironment outer({[] { return YEAR_3000; }, [] { return std::string("outer"); }});
+  const ScopedEnvironment inner{Environment{}};
+  EXPECT_LT(GetUtcDateTime().GetUtcTime(), YEAR_3000);
+  EXPECT_EQ(StringUtil::GenerateUuid().size(), 36U);
+}
+
+TEST(ScopedEnvironment, HoldsOnEveryThread) {
+  const ScopedEnvironment scope(Clock(42));
+  std::int64_t seen = 0;
+  std::thread([&] { seen = GetUtcDateTime().GetUtcTime(); }).join();
+  EXPECT_EQ(seen, 42);
+}
+
+TEST(ScopedEnvironment, ClockSaturatesLikeEveryDateTime) {
+  const ScopedEnvironment scope(Clock(std::numeric_limits<std::int64_t>::max()));
+  EXPECT_EQ(GetUtcDateTime().ToString(), "9999-12-31T23:59:59.999Z");
+}
+
+} // namespace
+} // namespace System
+} // namespace Tarvel
