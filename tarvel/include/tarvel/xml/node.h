@@ -2,10 +2,11 @@
 /// @file
 /// The nodes of an XML tree.
 ///
-/// The nodes of one parsed document, or one node made alone, live in one arena, which is kept alive by every `Ref` to any of
-/// its nodes, by the `Document`, and by the arenas of the trees that its nodes were appended to. A plain pointer to a node
-/// is good as long as any of these is. A tree may be read from any number of threads, and changed from one thread while
-/// nobody else uses it. Texts are UTF-8; a view into a tree is good as long as the tree, and until that text is changed.
+/// The nodes of one parsed document, or one node made alone, live in one arena, which is kept alive by the `Document` and by
+/// every `Ref` to any of its nodes. Appending a node to another tree joins the two arenas for good: each `Ref` to a node of
+/// either then keeps both alive. A plain pointer to a node is good as long as any of these is. A tree may be read from any
+/// number of threads, and changed from one thread while nobody else uses it, nor copies or drops a `Ref` to it. Texts are
+/// UTF-8; a view into a tree is good as long as the tree.
 
 #pragma once
 
@@ -55,7 +56,8 @@ protected:
   Node(NodeKind kind, NodeArena *arena) noexcept : m_arena(arena), m_kind(kind) {}
   ~Node() = default;
 
-  void AppendNode(Node *child);
+  void AppendNode(Node *child) noexcept;
+  void RemoveNode(Node *child) noexcept;
 
   NodeArena *m_arena;
   Node *m_parent = nullptr;
@@ -64,6 +66,7 @@ protected:
   Node *m_nextSibling = nullptr;
   NodeKind m_kind;
 
+  friend class ElementNode;
   friend class NodeArena;
   friend class TreeBuilder;
 };
@@ -201,15 +204,22 @@ public:
 
 private:
   explicit ElementNode(NodeArena *arena) noexcept : Node(NodeKind::ELEMENT, arena) {}
+
+  // Both take views that live as long as the arena.
+  void SetName(std::string_view name) noexcept;
+  void AppendAttribute(std::string_view name, std::string_view value);
+
   std::string_view m_name;
   Attribute *m_firstAttribute = nullptr;
   Attribute *m_lastAttribute = nullptr;
   Attribute *m_firstDeclaration = nullptr;
+  Attribute *m_lastDeclaration = nullptr;
   std::uint32_t m_prefixLength = 0;
   std::uint32_t m_line = 0;
   std::uint32_t m_column = 0;
   friend class NodeArena;
   friend class TreeBuilder;
+  friend TARVEL_API void CreateElementNode(std::string_view prefix, std::string_view localName, Ref<ElementNode> &out);
 };
 
 /// The root of a parsed document: its children are the document element and the comments and processing instructions

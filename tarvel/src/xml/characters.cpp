@@ -1,0 +1,160 @@
+// SPDX-License-Identifier: Apache-2.0
+
+#include "xml/characters.h"
+
+#include <algorithm>
+#include <cstdio>
+#include <cstring>
+#include <iterator>
+
+namespace Tarvel {
+namespace Xml {
+
+namespace {
+
+struct Range {
+  std::uint32_t first;
+  std::uint32_t last;
+};
+
+// NameStartChar of XML 1.0, production 4, above ASCII.
+constexpr Range NAME_START_RANGES[] = {{0xC0, 0xD6},     {0xD8, 0xF6},     {0xF8, 0x2FF},    {0x370, 0x37D},
+                                       {0x37F, 0x1FFF},  {0x200C, 0x200D}, {0x2070, 0x218F}, {0x2C00, 0x2FEF},
+                                       {0x3001, 0xD7FF}, {0xF900, 0xFDCF}, {0xFDF0, 0xFFFD}, {0x10000, 0xEFFFF}};
+
+// What NameChar, production 4a, has in addition above ASCII.
+constexpr Range NAME_MORE_RANGES[] = {{0xB7, 0xB7}, {0x300, 0x36F}, {0x203F, 0x2040}};
+
+template <std::size_t N>
+bool IsIn(const Range (&ranges)[N], std::uint32_t character) noexcept {
+  return std::any_of(std::begin(ranges), std::end(ranges),
+                     [character](const Range &range) { return range.first <= character && character <= range.last; });
+}
+
+bool IsNameStart(std::uint32_t c) noexcept {
+  if (c < 0x80) {
+    return (c >= 'a' && c <= 'z') || (c >= 'A' && c <= 'Z') || c == '_';
+  }
+  return IsIn(NAME_START_RANGES, c);
+}
+
+bool IsNameCharacter(std::uint32_t c) noexcept {
+  if (c < 0x80) {
+    return IsNameStart(c) || (c >= '0' && c <= '9') || c == '-' || c == '.';
+  }
+  return IsIn(NAME_START_RANGES, c) || IsIn(NAME_MORE_RANGES, c);
+}
+
+/// Char of XML 1.0, production 2.
+bool IsXmlCharacter(std::uint32_t c) noexcept {
+  if (c < 0x20) {
+    return c == '\t' || c == '\n' || c == '\r';
+  }
+  return c <= 0xD7FF || (c >= 0xE000 && c <= 0xFFFD) || (c >= 0x10000 && c <= 0x10FFFF);
+}
+
+std::uint32_t Byte(std::string_view text, std::size_t offset) noexcept {
+  return static_cast<unsigned char>(text[offset]);
+}
+
+} // namespace
+
+std::uint32_t ReadCharacter(std::string_view text, std::size_t &offset) noexcept {
+  const std::uint32_t lead = Byte(text, offset);
+  if (lead < 0x80) {
+    ++offset;
+    return lead;
+  }
+  const std::size_t length = lead >= 0xF0 ? 4 : lead >= 0xE0 ? 3 : 2;
+  if (lead < 0xC2 || lead > 0xF4 || text.size() - offset < length) {
+    return NO_CHARACTER;
+  }
+  std::uint32_t character = lead & (0x7Fu >> length);
+  for (std::size_t i = 1; i < length; ++i) {
+    const std::uint32_t next = Byte(text, offset + i);
+    if ((next & 0xC0) != 0x80) {
+      return NO_CHARACTER;
+    }
+    character = character << 6 | (next & 0x3F);
+  }
+  const bool overlong = (length == 3 && character < 0x800) || (length == 4 && character < 0x10000);
+  const bool surrogate = character >= 0xD800 && character <= 0xDFFF;
+  if (overlong || surrogate || character > 0x10FFFF) {
+    return NO_CHARACTER;
+  }
+  offset += length;
+  return character;
+}
+
+std::size_t FindNonAscii(std::string_view text) noexcept {
+  constexpr std::size_t BLOCK = 64; // four words side by side keep the loop short without hiding the place
+  constexpr std::uint64_t HIGH_BITS = 0x8080808080808080u;
+  std::size_t offset = 0;
+  for (; text.size() - offset >= BLOCK; offset += BLOCK) {
+    std::uint64_t words[BLOCK / sizeof(std::uint64_t)];
+    std::memcpy(words, text.data() + offset, BLOCK);
+    std::uint64_t all = 0;
+    for (const std::uint64_t word : words) {
+      all |= word;
+    }
+    if (all & HIGH_BITS) {
+      break;
+    }
+  }
+  for (; offset < text.size(); ++offset) {
+    if (Byte(text, offset) >= 0x80) {
+      return offset;
+    }
+  }
+  return std::string_view::npos;
+}
+
+std::size_t FindInvalidUtf8(std::string_view text) noexcept {
+  std::size_t offset = 0;
+  while (offset < text.size()) {
+    const std::size_t ascii = FindNonAscii(text.substr(offset));
+    if (ascii == std::string_view::npos) {
+      return std::string_view::npos;
+    }
+    offset += ascii;
+    while (offset < text.size() && Byte(text, offset) >= 0x80) {
+      if (ReadCharacter(text, offset) == NO_CHARACTER) {
+        return offset;
+      }
+    }
+  }
+  return std::string_view::npos;
+}
+
+std::string DescribeForbiddenCharacter(std::string_view what, std::string_view text) {
+  std::size_t offset = 0;
+  while (offset < text.size()) {
+    const std::size_t begin = offset;
+    const std::uint32_t character = ReadCharacter(text, offset);
+    if (character == NO_CHARACTER) {
+      return std::string(what) + " is not UTF-8 at byte " + std::to_string(begin + 1);
+    }
+    if (!IsXmlCharacter(character)) {
+      char code[16];
+      std::snprintf(code, sizeof code, "U+%04X", static_cast<unsigned>(character));
+      return std::string(what) + " holds the character " + code + " at byte " + std::to_string(begin + 1) +
+             ", which XML 1.0 cannot carry";
+    }
+  }
+  return std::string();
+}
+
+bool IsNcName(std::string_view name) noexcept {
+  std::size_t offset = 0;
+  while (offset < name.size()) {
+    const bool isFirst = offset == 0;
+    const std::uint32_t character = ReadCharacter(name, offset);
+    if (character == NO_CHARACTER || !(isFirst ? IsNameStart(character) : IsNameCharacter(character))) {
+      return false;
+    }
+  }
+  return !name.empty();
+}
+
+} // namespace Xml
+} // namespace Tarvel

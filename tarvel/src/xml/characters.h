@@ -1,0 +1,35 @@
+// SPDX-License-Identifier: Apache-2.0
+/// @file
+/// Which bytes are UTF-8, and which characters XML 1.0 (fifth edition) lets stand in text and in names.
+
+#pragma once
+
+#include <cstddef>
+#include <cstdint>
+#include <string>
+#include <string_view>
+
+namespace Tarvel {
+namespace Xml {
+
+constexpr std::uint32_t NO_CHARACTER = 0xFFFFFFFF;
+
+/// Reads the character that begins at `offset`, which is less than the text's size, and moves `offset` past it.
+/// @return its code point, or `NO_CHARACTER` when the bytes there are not UTF-8; `offset` then stays.
+std::uint32_t ReadCharacter(std::string_view text, std::size_t &offset) noexcept;
+
+/// The offset of the first byte that is not part of well-formed UTF-8, or `npos`.
+std::size_t FindInvalidUtf8(std::string_view text) noexcept;
+
+/// The offset of the first byte above 0x7F, or `npos`.
+std::size_t FindNonAscii(std::string_view text) noexcept;
+
+/// What keeps an XML 1.0 document from carrying `text` ("... holds the character U+0001, ..."), or nothing. `what` names
+/// the text at the beginning of the message.
+std::string DescribeForbiddenCharacter(std::string_view what, std::string_view text);
+
+/// Whether `name` is an NCName: a name without a colon.
+bool IsNcName(std::string_view name) noexcept;
+
+} // namespace Xml
+} // namespace Tarvel

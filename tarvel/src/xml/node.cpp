@@ -1,0 +1,252 @@
+// SPDX-License-Identifier: Apache-2.0
+
+#include <tarvel/xml/node.h>
+
+#include "xml/characters.h"
+#include "xml/node_arena.h"
+
+#include <tarvel/core/exception.h>
+
+#include <string>
+
+namespace Tarvel {
+namespace Xml {
+
+namespace {
+
+constexpr std::string_view XML_NAMESPACE = "http://www.w3.org/XML/1998/namespace";
+constexpr std::string_view XMLNS_NAMESPACE = "http://www.w3.org/2000/xmlns/";
+
+// What a composed message needs: an element with a few attributes, a short text.
+constexpr std::size_t ELEMENT_ARENA_BYTES = 512;
+constexpr std::size_t TEXT_ARENA_BYTES = 192;
+
+void RequireXmlText(std::string_view what, std::string_view text) {
+  const std::string refusal = DescribeForbiddenCharacter(what, text);
+  if (!refusal.empty()) {
+    throw InvalidArgumentException(refusal);
+  }
+}
+
+void RequireNcName(std::string_view what, std::string_view name) {
+  if (!IsNcName(name)) {
+    throw InvalidArgumentException(std::string(what) + " '" + std::string(name) +
+                                   "' is not an XML name without a colon");
+  }
+}
+
+/// The prefix that a namespace declaration binds; empty for the default namespace.
+std::string_view GetDeclaredPrefix(const Attribute &declaration) noexcept {
+  return declaration.GetPrefix().empty() ? std::string_view() : declaration.GetLocalName();
+}
+
+} // namespace
+
+const Node *Node::GetRoot() const noexcept {
+  const Node *node = this;
+  while (node->m_parent) {
+    node = node->m_parent;
+  }
+  return node;
+}
+
+void Node::AddRef() const noexcept {
+  m_arena->AddRef();
+}
+
+void Node::Release() const noexcept {
+  m_arena->Release();
+}
+
+void Node::AppendNode(Node *child) noexcept {
+  child->m_parent = this;
+  (m_lastChild ? m_lastChild->m_nextSibling : m_firstChild) = child;
+  m_lastChild = child;
+}
+
+void Node::RemoveNode(Node *child) noexcept {
+  Node *previous = nullptr;
+  for (Node *node = m_firstChild; node != child; node = node->m_nextSibling) {
+    previous = node;
+  }
+  (previous ? previous->m_nextSibling : m_firstChild) = child->m_nextSibling;
+  if (m_lastChild == child) {
+    m_lastChild = previous;
+  }
+  child->m_parent = nullptr;
+  child->m_nextSibling = nullptr;
+}
+
+void TextNode::SetValue(std::string_view value) {
+  RequireXmlText("the text", value);
+  m_value = m_arena->Copy(value);
+}
+
+bool ElementNode::LookupNamespace(std::string_view prefix, std::string_view &uri) const noexcept {
+  if (prefix == "xml" || prefix == "xmlns") {
+    uri = prefix == "xml" ? XML_NAMESPACE : XMLNS_NAMESPACE;
+    return true;
+  }
+  for (const ElementNode *element = this; element; element = AsElement(element->GetParent())) {
+    for (const Attribute *declaration = element->m_firstDeclaration; declaration;
+         declaration = declaration->m_nextDeclaration) {
+      if (GetDeclaredPrefix(*declaration) != prefix) {
+        continue;
+      }
+      if (declaration->GetValue().empty() && !prefix.empty()) {
+        return false;
+      }
+      uri = declaration->GetValue();
+      return true;
+    }
+  }
+  if (!prefix.empty()) {
+    return false;
+  }
+  uri = std::string_view();
+  return true;
+}
+
+QName ElementNode::GetQName() const {
+  std::string_view uri;
+  LookupNamespace(GetPrefix(), uri);
+  return QName(std::string(uri), std::string(GetLocalName()));
+}
+
+bool ElementNode::HasQName(std::string_view namespaceUri, std::string_view localName) const noexcept {
+  std::string_view uri;
+  return GetLocalName() == localName && LookupNamespace(GetPrefix(), uri) && uri == namespaceUri;
+}
+
+const Attribute *ElementNode::FindAttribute(std::string_view namespaceUri, std::string_view localName) const noexcept {
+  for (const Attribute *attribute = m_firstAttribute; attribute; attribute = attribute->m_next) {
+    if (attribute->m_isNamespaceDeclaration || attribute->GetLocalName() != localName ||
+        attribute->GetPrefix().empty() != namespaceUri.empty()) {
+      continue;
+    }
+    std::string_view uri;
+    if (namespaceUri.empty() || (LookupNamespace(attribute->GetPrefix(), uri) && uri == namespaceUri)) {
+      return attribute;
+    }
+  }
+  return nullptr;
+}
+
+const Attribute *ElementNode::FindAttribute(const QName &name) const noexcept {
+  return FindAttribute(name.namespaceUri, name.localName);
+}
+
+bool ElementNode::GetAttribute(const QName &name, std::string_view &value) const noexcept {
+  const Attribute *const attribute = FindAttribute(name);
+  if (!attribute) {
+    return false;
+  }
+  value = attribute->GetValue();
+  return true;
+}
+
+const ElementNode *ElementNode::FindChildElement(const QName &name) const noexcept {
+  for (const Node *node = m_firstChild; node; node = node->GetNextSibling()) {
+    const ElementNode *const element = AsElement(node);
+    if (element && element->HasQName(name.namespaceUri, name.localName)) {
+      return element;
+    }
+  }
+  return nullptr;
+}
+
+ElementNode *ElementNode::FindChildElement(const QName &name) noexcept {
+  return const_cast<ElementNode *>(static_cast<const ElementNode *>(this)->FindChildElement(name));
+}
+
+const ElementNode *ElementNode::FindChildElement(std::string_view localName) const noexcept {
+  for (const Node *node = m_firstChild; node; node = node->GetNextSibling()) {
+    const ElementNode *const element = AsElement(node);
+    if (element && element->GetLocalName() == localName) {
+      return element;
+    }
+  }
+  return nullptr;
+}
+
+void ElementNode::DefineAttribute(std::string_view qualifiedName, std::string_view value) {
+  const std::size_t colon = qualifiedName.find(':');
+  const bool hasPrefix = colon != std::string_view::npos;
+  if ((hasPrefix && !IsNcName(qualifiedName.substr(0, colon))) ||
+      !IsNcName(hasPrefix ? qualifiedName.substr(colon + 1) : qualifiedName)) {
+    throw InvalidArgumentException("the attribute name '" + std::string(qualifiedName) +
+                                   "' is not a qualified XML name");
+  }
+  RequireXmlText("the value of the attribute '" + std::string(qualifiedName) + "'", value);
+  for (Attribute *attribute = m_firstAttribute; attribute; attribute = attribute->m_next) {
+    if (attribute->m_name == qualifiedName) {
+      attribute->m_value = m_arena->Copy(value);
+      return;
+    }
+  }
+  const std::string_view name = m_arena->Copy(qualifiedName);
+  AppendAttribute(name, m_arena->Copy(value));
+}
+
+void ElementNode::SetName(std::string_view name) noexcept {
+  const std::size_t colon = name.find(':');
+  m_name = name;
+  m_prefixLength = colon == std::string_view::npos ? 0 : static_cast<std::uint32_t>(colon);
+}
+
+void ElementNode::AppendAttribute(std::string_view name, std::string_view value) {
+  Attribute *const attribute = m_arena->New<Attribute>();
+  const std::size_t colon = name.find(':');
+  attribute->m_name = name;
+  attribute->m_value = value;
+  attribute->m_prefixLength = colon == std::string_view::npos ? 0 : static_cast<std::uint32_t>(colon);
+  attribute->m_isNamespaceDeclaration = (colon == std::string_view::npos ? name : name.substr(0, colon)) == "xmlns";
+  (m_lastAttribute ? m_lastAttribute->m_next : m_firstAttribute) = attribute;
+  m_lastAttribute = attribute;
+  if (attribute->m_isNamespaceDeclaration) {
+    (m_lastDeclaration ? m_lastDeclaration->m_nextDeclaration : m_firstDeclaration) = attribute;
+    m_lastDeclaration = attribute;
+  }
+}
+
+void ElementNode::AppendChild(Node *child) {
+  if (!child || child->GetKind() == NodeKind::DOCUMENT) {
+    throw InvalidArgumentException(child ? "a document cannot be a child" : "the child is null");
+  }
+  // A node of an arena that is not joined with this one's cannot be above.
+  if (NodeArena::AreJoined(m_arena, child->m_arena)) {
+    for (const Node *node = this; node; node = node->GetParent()) {
+      if (node == child) {
+        throw InvalidArgumentException("an element cannot be a child of itself or of a node below it");
+      }
+    }
+  }
+  if (child->m_parent && child->m_parent->GetKind() == NodeKind::ELEMENT) {
+    throw InvalidStateException("the node already is the child of an element");
+  }
+  if (child->m_parent) {
+    child->m_parent->RemoveNode(child);
+  }
+  AppendNode(child);
+  NodeArena::Join(m_arena, child->m_arena);
+}
+
+void CreateElementNode(std::string_view prefix, std::string_view localName, Ref<ElementNode> &out) {
+  if (!prefix.empty()) {
+    RequireNcName("the prefix", prefix);
+  }
+  RequireNcName("the local name", localName);
+  NodeArena *const arena = NodeArena::Create(ELEMENT_ARENA_BYTES);
+  const Ref<ElementNode> element(arena->New<ElementNode>(arena));
+  element->SetName(
+      arena->Copy(prefix.empty() ? std::string(localName) : std::string(prefix) + ':' + std::string(localName)));
+  out = element;
+}
+
+void CreateTextNode(Ref<TextNode> &out) {
+  NodeArena *const arena = NodeArena::Create(TEXT_ARENA_BYTES);
+  out = Ref<TextNode>(arena->New<TextNode>(arena));
+}
+
+} // namespace Xml
+} // namespace Tarvel

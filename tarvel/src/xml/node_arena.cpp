@@ -1,0 +1,114 @@
+// SPDX-License-Identifier: Apache-2.0
+
+#include "xml/node_arena.h"
+
+#include <algorithm>
+#include <cstring>
+
+namespace Tarvel {
+namespace Xml {
+
+namespace {
+
+constexpr std::size_t SMALLEST_BLOCK_BYTES = 1024;
+constexpr std::size_t LARGEST_BLOCK_BYTES = 64 * 1024;
+
+constexpr std::size_t RoundUp(std::size_t size, std::size_t alignment) noexcept {
+  return (size + alignment - 1) / alignment * alignment;
+}
+
+} // namespace
+
+// The arena and its first room are one piece of memory: a node made alone costs one allocation.
+NodeArena *NodeArena::Create(std::size_t firstBytes) {
+  const std::size_t room = RoundUp(firstBytes, ALIGNMENT);
+  return new (::operator new(sizeof(NodeArena) + room)) NodeArena(room);
+}
+
+NodeArena::NodeArena(std::size_t firstBytes) noexcept
+    : m_free(reinterpret_cast<char *>(this) + sizeof(NodeArena)), m_end(m_free + firstBytes),
+      m_nextBlockBytes(std::clamp(firstBytes, SMALLEST_BLOCK_BYTES, LARGEST_BLOCK_BYTES)) {}
+
+NodeArena::~NodeArena() {
+  while (m_blocks) {
+    ::operator delete(std::exchange(m_blocks, m_blocks->next));
+  }
+}
+
+void NodeArena::Release() noexcept {
+  NodeArena *const leader = GetLeader();
+  if (leader->m_references.fetch_sub(1, std::memory_order_acq_rel) == 1) {
+    leader->FreeAll();
+  }
+}
+
+void NodeArena::FreeAll() noexcept {
+  NodeArena *arena = this;
+  while (arena) {
+    NodeArena *const next = arena->m_nextInGroup;
+    arena->~NodeArena();
+    ::operator delete(arena);
+    arena = next;
+  }
+}
+
+void NodeArena::Join(NodeArena *a, NodeArena *b) noexcept {
+  NodeArena *larger = a->GetLeader();
+  NodeArena *smaller = b->GetLeader();
+  if (larger == smaller) {
+    return;
+  }
+  if (larger->m_groupSize < smaller->m_groupSize) {
+    std::swap(larger, smaller);
+  }
+  larger->m_references.fetch_add(smaller->m_references.load(std::memory_order_relaxed), std::memory_order_relaxed);
+  larger->m_groupSize += smaller->m_groupSize;
+  larger->m_lastInGroup->m_nextInGroup = smaller;
+  larger->m_lastInGroup = smaller->m_lastInGroup;
+  smaller->m_leader = larger;
+}
+
+void *NodeArena::Allocate(std::size_t size) {
+  char *begin = m_free + (-reinterpret_cast<std::uintptr_t>(m_free) & (ALIGNMENT - 1));
+  if (begin > m_end || static_cast<std::size_t>(m_end - begin) < size) {
+    AddBlock(size);
+    begin = m_free;
+  }
+  m_free = begin + size;
+  return begin;
+}
+
+std::string_view NodeArena::Copy(std::string_view text) {
+  if (text.empty()) {
+    return std::string_view();
+  }
+  if (text.size() >= LARGEST_BLOCK_BYTES / 4) { // a block of its own, so that the rest of the current one is not lost
+    char *const own = AllocateBlock(text.size());
+    std::memcpy(own, text.data(), text.size());
+    return std::string_view(own, text.size());
+  }
+  if (static_cast<std::size_t>(m_end - m_free) < text.size()) {
+    AddBlock(text.size());
+  }
+  char *const copy = m_free;
+  std::memcpy(copy, text.data(), text.size());
+  m_free += text.size();
+  return std::string_view(copy, text.size());
+}
+
+void NodeArena::AddBlock(std::size_t size) {
+  const std::size_t room = std::max(size, m_nextBlockBytes);
+  m_free = AllocateBlock(room);
+  m_end = m_free + room;
+  m_nextBlockBytes = std::min(2 * m_nextBlockBytes, LARGEST_BLOCK_BYTES);
+}
+
+char *NodeArena::AllocateBlock(std::size_t size) {
+  Block *const block = static_cast<Block *>(::operator new(sizeof(Block) + size));
+  block->next = m_blocks;
+  m_blocks = block;
+  return reinterpret_cast<char *>(block + 1);
+}
+
+} // namespace Xml
+} // namespace Tarvel

@@ -1,0 +1,96 @@
+// SPDX-License-Identifier: Apache-2.0
+/// @file
+/// `NodeArena`, the memory that the nodes of a tree live in.
+
+#pragma once
+
+#include <tarvel/core/ref.h>
+
+#include <atomic>
+#include <cstddef>
+#include <cstdint>
+#include <new>
+#include <string_view>
+#include <type_traits>
+#include <utility>
+
+namespace Tarvel {
+namespace Xml {
+
+/// Memory that grows and is freed at once. Nodes never need destruction, so that dropping a tree costs a few frees,
+/// however large or deep it is.
+///
+/// Arenas whose trees grow together are joined: from then on they share one count of references and die together. A tree
+/// that is appended to another thereby lives as long as any reference to either, and no cycle of owners can arise. To
+/// join needs the trees for oneself; to count references does not.
+class NodeArena {
+public:
+  /// An arena without references. Whoever makes the first node in it takes the first reference by a `Ref` to that node.
+  /// @param firstBytes room that is there from the beginning.
+  static NodeArena *Create(std::size_t firstBytes);
+
+  NodeArena(const NodeArena &) = delete;
+  NodeArena &operator=(const NodeArena &) = delete;
+
+  void AddRef() noexcept { GetLeader()->m_references.fetch_add(1, std::memory_order_relaxed); }
+  void Release() noexcept;
+
+  /// A new node or attribute, in this arena's memory.
+  template <typename T, typename... Args>
+  T *New(Args &&...args) {
+    static_assert(std::is_trivially_destructible_v<T>, "nothing in an arena is ever destroyed");
+    static_assert(alignof(T) <= ALIGNMENT);
+    return new (Allocate(sizeof(T))) T(std::forward<Args>(args)...);
+  }
+
+  /// A copy of `text` in this arena's memory.
+  std::string_view Copy(std::string_view text);
+
+  /// Keeps `object`, which views of this arena's nodes point into, for as long as the arena lives.
+  void Keep(const Ref<Object> &object) { m_kept = object; }
+
+  static bool AreJoined(const NodeArena *a, const NodeArena *b) noexcept { return a->GetLeader() == b->GetLeader(); }
+
+  /// Joins the arenas of `a` and of `b`; nothing happens when they are joined already.
+  static void Join(NodeArena *a, NodeArena *b) noexcept;
+
+private:
+  static constexpr std::size_t ALIGNMENT = alignof(void *);
+
+  struct Block {
+    Block *next;
+  };
+
+  explicit NodeArena(std::size_t firstBytes) noexcept;
+  ~NodeArena();
+
+  void *Allocate(std::size_t size);
+  void AddBlock(std::size_t size);
+  char *AllocateBlock(std::size_t size);
+  void FreeAll() noexcept;
+
+  /// The arena that holds the count of all that are joined with this one. Joining always puts the smaller group below the
+  /// larger, so that the way is no longer than the logarithm of their number and need not be shortened by readers.
+  NodeArena *GetLeader() noexcept {
+    NodeArena *arena = this;
+    while (arena->m_leader) {
+      arena = arena->m_leader;
+    }
+    return arena;
+  }
+  const NodeArena *GetLeader() const noexcept { return const_cast<NodeArena *>(this)->GetLeader(); }
+
+  std::atomic<std::uint32_t> m_references{0}; // a leader's: those to all of its group
+  std::uint32_t m_groupSize = 1;
+  NodeArena *m_leader = nullptr;
+  NodeArena *m_nextInGroup = nullptr;
+  NodeArena *m_lastInGroup = this; // a leader's
+  char *m_free;
+  char *m_end;
+  Block *m_blocks = nullptr;
+  std::size_t m_nextBlockBytes;
+  Ref<Object> m_kept;
+};
+
+} // namespace Xml
+} // namespace Tarvel

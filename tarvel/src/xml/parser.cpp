@@ -1,0 +1,70 @@
+// SPDX-License-Identifier: Apache-2.0
+
+#include <tarvel/xml/parser.h>
+
+#include "xml/sax_session.h"
+#include "xml/source_checks.h"
+#include "xml/tree_builder.h"
+
+#include <string>
+#include <utility>
+
+namespace Tarvel {
+namespace Xml {
+
+namespace {
+
+/// The text of a document, kept where it is for as long as views into it are used.
+class SourceText final : public Object {
+public:
+  explicit SourceText(std::string text) noexcept : m_text(std::move(text)) {}
+  std::string_view Get() const noexcept { return m_text; } // a null byte follows
+
+private:
+  const std::string m_text;
+};
+
+class XMLParserImpl final : public XMLParser {
+public:
+  explicit XMLParserImpl(Ref<XMLHandler> handler) noexcept : m_handler(std::move(handler)) {}
+
+  Ref<Object> Parse(Reader &reader) override {
+    const Ref<SourceText> source = MakeRef<SourceText>(reader.ReadToEnd(MAX_DOCUMENT_BYTES));
+    CheckSource(source->Get());
+    m_handler->StartDocument(source->Get(), source);
+    SaxSession(source->Get(), *m_handler).Run();
+    return m_handler->TakeResult();
+  }
+
+private:
+  const Ref<XMLHandler> m_handler;
+};
+
+} // namespace
+
+XMLParseException::XMLParseException(const std::string &detail, std::uint32_t line, std::uint32_t column)
+    : Exception(detail + " at line " + std::to_string(line) + ", column " + std::to_string(column)), m_line(line),
+      m_column(column) {}
+
+XMLParseException::~XMLParseException() = default;
+
+XMLParseException *XMLParseException::Clone() const {
+  return new XMLParseException(*this);
+}
+
+void XMLParseException::Throw() const {
+  throw *this;
+}
+
+XMLParser::~XMLParser() = default;
+
+Ref<XMLHandler> CreateXMLDocumentHandler() {
+  return MakeRef<TreeBuilder>();
+}
+
+Ref<XMLParser> CreateXMLParser(const Ref<XMLHandler> &handler) {
+  return MakeRef<XMLParserImpl>(handler);
+}
+
+} // namespace Xml
+} // namespace Tarvel

@@ -1,0 +1,304 @@
+// SPDX-License-Identifier: Apache-2.0
+
+#include "xml/sax_session.h"
+
+#include <libxml/SAX2.h>
+#include <libxml/parserInternals.h>
+#include <libxml/xmlerror.h>
+
+#include <algorithm>
+#include <cstring>
+#include <functional>
+#include <mutex>
+#include <new>
+
+namespace Tarvel {
+namespace Xml {
+
+namespace {
+
+constexpr std::size_t NPOS = std::string_view::npos;
+constexpr std::size_t LONGEST_FOREIGN_DETAIL = 300;
+
+// Our limits stand in place of libxml2's; the encoding is judged before.
+constexpr int PARSE_OPTIONS = XML_PARSE_NONET | XML_PARSE_HUGE | XML_PARSE_IGNORE_ENC;
+
+std::string_view ToView(const xmlChar *text) noexcept {
+  return text ? std::string_view(reinterpret_cast<const char *>(text)) : std::string_view();
+}
+
+std::string_view ToView(const xmlChar *begin, const xmlChar *end) noexcept {
+  return std::string_view(reinterpret_cast<const char *>(begin), static_cast<std::size_t>(end - begin));
+}
+
+/// libxml2's words for an error, in one line and at a readable length, cut between two characters.
+std::string GetDetail(const xmlError &error) {
+  std::string detail = error.message ? error.message : "the document is not well-formed";
+  if (detail.size() > LONGEST_FOREIGN_DETAIL) {
+    std::size_t end = LONGEST_FOREIGN_DETAIL;
+    while ((static_cast<unsigned char>(detail[end]) & 0xC0) == 0x80) {
+      --end;
+    }
+    detail.resize(end);
+    detail += "...";
+  }
+  while (!detail.empty() && detail.back() == '\n') {
+    detail.pop_back();
+  }
+  std::replace(detail.begin(), detail.end(), '\n', ' ');
+  return detail;
+}
+
+/// Gives a host that uses libxml2 itself its thread's last error back, which each of our errors would replace.
+class LastErrorKeeper {
+public:
+  LastErrorKeeper() {
+    if (const xmlError *const last = xmlGetLastError()) {
+      xmlCopyError(const_cast<xmlError *>(last), &m_kept);
+    }
+  }
+  LastErrorKeeper(const LastErrorKeeper &) = delete;
+  LastErrorKeeper &operator=(const LastErrorKeeper &) = delete;
+
+  ~LastErrorKeeper() {
+    xmlResetLastError();
+    if (m_kept.code != XML_ERR_OK) {
+      xmlCopyError(&m_kept, &xmlLastError);
+      xmlResetError(&m_kept);
+    }
+  }
+
+private:
+  xmlError m_kept{};
+};
+
+} // namespace
+
+/// What libxml2 calls. Nothing may be thrown through its frames.
+struct SaxSession::Callbacks {
+  template <typename Handle>
+  static void Call(void *data, Handle handle) noexcept {
+    SaxSession &session = *static_cast<SaxSession *>(data);
+    if (session.m_failure) {
+      session.Stop();
+      return;
+    }
+    try {
+      handle(session);
+    } catch (...) {
+      session.m_failure = std::current_exception();
+      session.Stop();
+    }
+  }
+
+  static void InternalSubset(void *data, const xmlChar *, const xmlChar *, const xmlChar *) {
+    Call(data, [](SaxSession &session) {
+      const std::size_t begin = session.m_source.rfind("<!DOCTYPE", session.GetOffset());
+      session.Refuse("a document type declaration is not accepted", begin == NPOS ? 0 : begin);
+    });
+  }
+
+  static void StartElement(void *data, const xmlChar *, const xmlChar *, const xmlChar *, int namespaceCount,
+                           const xmlChar **namespaces, int attributeCount, int, const xmlChar **attributes) {
+    Call(data, [=](SaxSession &session) {
+      session.StartElement(namespaces, static_cast<std::size_t>(namespaceCount), attributes,
+                           static_cast<std::size_t>(attributeCount));
+    });
+  }
+
+  static void EndElement(void *data, const xmlChar *, const xmlChar *, const xmlChar *) {
+    Call(data, [](SaxSession &session) { session.EndElement(); });
+  }
+
+  static void Characters(void *data, const xmlChar *text, int length) {
+    Call(data, [=](SaxSession &session) { session.m_handler.Characters(ToView(text, text + length)); });
+  }
+
+  static void Comment(void *data, const xmlChar *text) {
+    Call(data, [=](SaxSession &session) { session.m_handler.Comment(ToView(text)); });
+  }
+
+  static void ProcessingInstruction(void *data, const xmlChar *target, const xmlChar *content) {
+    Call(data, [=](SaxSession &session) { session.m_handler.ProcessingInstruction(ToView(target), ToView(content)); });
+  }
+
+  static void Error(void *data, xmlErrorPtr error) {
+    if (!static_cast<SaxSession *>(data)->m_failure) { // the first error tells most
+      Call(data, [=](SaxSession &session) { session.TakeError(*error); });
+    }
+  }
+
+  static xmlSAXHandler GetTable() noexcept {
+    xmlSAXHandler table{};
+    table.initialized = XML_SAX2_MAGIC;
+    table.internalSubset = &InternalSubset;
+    table.startElementNs = &StartElement;
+    table.endElementNs = &EndElement;
+    table.characters = &Characters;
+    table.ignorableWhitespace = &Characters;
+    table.cdataBlock = &Characters;
+    table.comment = &Comment;
+    table.processingInstruction = &ProcessingInstruction;
+    table.serror = &Error;
+    return table;
+  }
+};
+
+/// The parser context, its callbacks and its input.
+struct SaxSession::Context {
+  explicit Context(SaxSession &session) : parser(xmlNewParserCtxt()) {
+    if (!parser) {
+      throw std::bad_alloc();
+    }
+    session.m_parser = parser;
+    *parser->sax = Callbacks::GetTable();
+    parser->userData = &session;
+    xmlCtxtUseOptions(parser, PARSE_OPTIONS);
+    // Of libxml2's inputs this is the one that neither copies the text nor scans it again and again as it advances.
+    const char *const text = session.m_source.data() + GetByteOrderMarkLength(session.m_source);
+    const xmlParserInputPtr input = xmlNewStringInputStream(parser, reinterpret_cast<const xmlChar *>(text));
+    if (!input || inputPush(parser, input) < 0) {
+      xmlFreeInputStream(input);
+      xmlFreeParserCtxt(parser);
+      throw std::bad_alloc();
+    }
+  }
+  Context(const Context &) = delete;
+  Context &operator=(const Context &) = delete;
+  ~Context() { xmlFreeParserCtxt(parser); }
+
+  xmlParserCtxtPtr parser;
+};
+
+SaxSession::SaxSession(std::string_view source, XMLHandler &handler)
+    : m_source(source), m_handler(handler), m_lineBegin(GetByteOrderMarkLength(source)), m_lineCounted(m_lineBegin) {}
+
+void SaxSession::Run() {
+  static std::once_flag initialised;
+  std::call_once(initialised, [] { xmlInitParser(); });
+  const LastErrorKeeper lastError;
+  const Context context(*this);
+  xmlParseDocument(context.parser);
+  if (m_failure) {
+    std::rethrow_exception(m_failure);
+  }
+  if (!context.parser->wellFormed) { // without having said why
+    throw XMLParseException("the document is not well-formed", 1, 1);
+  }
+}
+
+void SaxSession::StartElement(const xmlChar *const *namespaces, std::size_t namespaceCount,
+                              const xmlChar *const *attributes, std::size_t attributeCount) {
+  const std::size_t end = GetOffset(); // behind the last attribute
+  const void *const lessThan = memrchr(m_source.data(), '<', end);
+  const std::size_t begin = static_cast<std::size_t>(static_cast<const char *>(lessThan) - m_source.data());
+  if (m_declarations.size() == MAX_ELEMENT_DEPTH) {
+    Refuse("elements are nested deeper than " + std::to_string(MAX_ELEMENT_DEPTH), begin);
+    return;
+  }
+  m_declarations.push_back(namespaceCount);
+  m_declarationsInScope += namespaceCount;
+  if (m_declarationsInScope > MAX_NAMESPACES_IN_SCOPE) {
+    Refuse("more than " + std::to_string(MAX_NAMESPACES_IN_SCOPE) + " namespace declarations are in scope", begin);
+    return;
+  }
+  ReadStartTag(begin, end, namespaces, namespaceCount, attributes, attributeCount);
+  const SourcePosition position = AdvanceTo(begin);
+  m_handler.StartElement(m_name, m_attributes.data(), m_attributes.size(), position.line, position.column);
+}
+
+void SaxSession::EndElement() {
+  m_declarationsInScope -= m_declarations.back();
+  m_declarations.pop_back();
+  m_handler.EndElement();
+}
+
+// libxml2 hands out declarations and attributes apart from each other. Their order, and names that need no copy, are read
+// from the start tag again, which is well-formed; the values are libxml2's.
+void SaxSession::ReadStartTag(std::size_t begin, std::size_t end, const xmlChar *const *namespaces,
+                              std::size_t namespaceCount, const xmlChar *const *attributes,
+                              std::size_t attributeCount) {
+  const auto isSpace = [](char c) { return c == ' ' || c == '\n' || c == '\t' || c == '\r'; };
+  const char *const stop = m_source.data() + end;
+  const char *const nameBegin = m_source.data() + begin + 1;
+  const char *const nameEnd = std::find_if(nameBegin, stop, isSpace);
+  m_name = std::string_view(nameBegin, static_cast<std::size_t>(nameEnd - nameBegin));
+  m_attributes.clear();
+  std::size_t seenAttributes = 0;
+  std::size_t seenNamespaces = 0;
+  for (const char *next = std::find_if_not(nameEnd, stop, isSpace); next != stop;
+       next = std::find_if_not(next, stop, isSpace)) {
+    const char *const equals = std::find(next, stop, '=');
+    const char *const quote = std::find_if(equals, stop, [](char c) { return c == '"' || c == '\''; });
+    const char *const close = quote == stop ? stop : std::find(quote + 1, stop, *quote);
+    if (close == stop) {
+      break;
+    }
+    AttributeEvent event;
+    event.name = std::string_view(next, static_cast<std::size_t>(std::find_if(next, equals, isSpace) - next));
+    event.value = std::string_view(quote + 1, static_cast<std::size_t>(close - quote - 1));
+    const bool isDeclaration = event.name.substr(0, 5) == "xmlns" && (event.name.size() == 5 || event.name[5] == ':');
+    if (!isDeclaration && seenAttributes < attributeCount) {
+      const xmlChar *const *const attribute = attributes + 5 * seenAttributes; // name, prefix, URI, value, its end
+      event.value = ToView(attribute[3], attribute[4]);
+      ++seenAttributes;
+    }
+    // libxml2 does not report a declaration of the prefix "xml", whose value can be one alone.
+    if (isDeclaration && event.name != "xmlns:xml" && seenNamespaces < namespaceCount) {
+      const std::string_view uri = ToView(namespaces[2 * seenNamespaces + 1]); // prefix, URI
+      event.value = uri == event.value ? event.value : uri;
+      ++seenNamespaces;
+    }
+    m_attributes.push_back(event);
+    next = close + 1;
+  }
+  if (seenAttributes != attributeCount || seenNamespaces != namespaceCount) {
+    Refuse("the attributes of an element cannot be told apart", begin);
+  }
+}
+
+void SaxSession::TakeError(const xmlError &error) {
+  if (error.level < XML_ERR_ERROR || error.code == XML_NS_ERR_UNDEFINED_NAMESPACE) {
+    return;
+  }
+  if (error.code == XML_ERR_NO_MEMORY) {
+    throw std::bad_alloc();
+  }
+  const SourcePosition position = GetPosition(m_source, GetOffset());
+  m_failure = std::make_exception_ptr(XMLParseException(GetDetail(error), position.line, position.column));
+  // After an error that is not fatal libxml2 goes on with pointers into the input; the next event stops it.
+  if (error.level == XML_ERR_FATAL) {
+    Stop();
+  }
+}
+
+std::size_t SaxSession::GetOffset() const noexcept {
+  const char *const current = reinterpret_cast<const char *>(m_parser->input->cur);
+  const std::less<const char *> isBefore;
+  if (isBefore(current, m_source.data()) || isBefore(m_source.data() + m_source.size(), current)) {
+    return m_lineCounted;
+  }
+  return static_cast<std::size_t>(current - m_source.data());
+}
+
+SourcePosition SaxSession::AdvanceTo(std::size_t offset) noexcept {
+  const char *const text = m_source.data();
+  while (const void *const lineBreak = std::memchr(text + m_lineCounted, '\n', offset - m_lineCounted)) {
+    ++m_line;
+    m_lineBegin = m_lineCounted = static_cast<std::size_t>(static_cast<const char *>(lineBreak) - text) + 1;
+  }
+  m_lineCounted = offset;
+  return {m_line, static_cast<std::uint32_t>(1 + offset - m_lineBegin)};
+}
+
+void SaxSession::Refuse(const std::string &detail, std::size_t offset) {
+  const SourcePosition position = GetPosition(m_source, offset);
+  throw XMLParseException(detail, position.line, position.column);
+}
+
+void SaxSession::Stop() noexcept {
+  xmlStopParser(m_parser);
+}
+
+} // namespace Xml
+} // namespace Tarvel

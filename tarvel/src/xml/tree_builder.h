@@ -1,0 +1,43 @@
+// SPDX-License-Identifier: Apache-2.0
+/// @file
+/// `TreeBuilder`, the handler that makes a `Document` of what a parser reads.
+
+#pragma once
+
+#include <tarvel/xml/node.h>
+#include <tarvel/xml/parser.h>
+
+#include <string>
+
+namespace Tarvel {
+namespace Xml {
+
+/// Texts that lie in the document's source are used where they are; the others are copied into the arena of the tree.
+class TreeBuilder final : public XMLHandler {
+public:
+  void StartDocument(std::string_view source, const Ref<Object> &owner) override;
+  void StartElement(std::string_view name, const AttributeEvent *attributes, std::size_t count, std::uint32_t line,
+                    std::uint32_t column) override;
+  void EndElement() override;
+  void Characters(std::string_view text) override;
+  void Comment(std::string_view text) override;
+  void ProcessingInstruction(std::string_view target, std::string_view data) override;
+  Ref<Object> TakeResult() override;
+
+private:
+  bool IsInSource(std::string_view text) const noexcept;
+  std::string_view Store(std::string_view text);
+  void EndText();
+
+  Ref<DocumentNode> m_document;
+  NodeArena *m_arena = nullptr; // the document node's
+  Node *m_current = nullptr;    // the open element, or the document
+  std::string_view m_source;
+
+  // Character data that no other event has ended yet: one piece of the source, or pieces gathered in the buffer.
+  std::string_view m_text;
+  std::string m_gathered;
+};
+
+} // namespace Xml
+} // namespace Tarvel
