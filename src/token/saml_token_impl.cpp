@@ -3,7 +3,6 @@
 
 #include "token/assertion_parser.h"
 #include "token/token_checks.h"
-#include "token/token_facts.h"
 #include "xml/parse_xml.h"
 
 #include <ssoclient/exceptions.h>
@@ -33,12 +32,6 @@ std::string Canonicalize(const ElementNode &element) {
   return writer->TakeText();
 }
 
-/// Whether a restriction allows it at least once more. One without a number allows nothing.
-template <typename Restriction>
-bool Allows(const boost::optional<Restriction> &restriction) {
-  return restriction && restriction->Count && *restriction->Count != 0;
-}
-
 } // namespace
 
 SamlTokenImpl::SamlTokenImpl(const std::string &xml, const KeyInfoResolver &resolver, std::int64_t clockToleranceSec)
@@ -62,17 +55,7 @@ void SamlTokenImpl::InitializeFromDom(const ElementNode *element, const KeyInfoR
   CheckTokenProperties(assertion, clockToleranceSec);
   ValidateSignature(*assertion.Signature, resolver);
 
-  m_id = std::move(assertion.ID);
-  PopulateSubject(assertion.Subject);
-  if (assertion.Advice) {
-    m_advice = std::move(assertion.Advice->advice);
-  }
-  if (assertion.AttributeStatement) {
-    for (const AttributeType &attribute : assertion.AttributeStatement->attributes) {
-      PopulateTokenAttribute(attribute);
-    }
-  }
-  PopulateConditions(assertion.Conditions);
+  m_facts = TakeTokenFacts(std::move(assertion));
 }
 
 void SamlTokenImpl::ValidateSignature(const Signature &signature, const KeyInfoResolver &resolver) {
@@ -85,41 +68,6 @@ void SamlTokenImpl::ValidateSignature(const Signature &signature, const KeyInfoR
   }
   if (!verified) {
     throw InvalidSignatureException("Failed to verify signature: token might have been tampered with.");
-  }
-}
-
-void SamlTokenImpl::PopulateSubject(SubjectType &subject) {
-  m_subject = ParseSamlNameId(subject.NameID);
-  m_confirmationMethod = subject.SubjectConfirmation.Method;
-  m_confirmationCertificate = std::move(subject.SubjectConfirmation.SubjectConfirmationData.certificate);
-}
-
-void SamlTokenImpl::PopulateConditions(ConditionsType &conditions) {
-  m_startDate = conditions.NotBefore;
-  m_endDate = conditions.NotOnOrAfter;
-  m_renewable = Allows(conditions.RenewRestriction);
-  m_delegable = Allows(conditions.ProxyRestriction);
-  if (conditions.DelegationRestriction) {
-    for (const DelegateType &delegate : conditions.DelegationRestriction->delegates) {
-      m_delegationChain.push_back(ParseToDelegate(delegate));
-    }
-  }
-  if (conditions.AudienceRestriction) {
-    m_audience = std::move(conditions.AudienceRestriction->audiences);
-  }
-}
-
-void SamlTokenImpl::PopulateTokenAttribute(const AttributeType &attribute) {
-  if (SamlAttributeIsGroupIdentity(attribute)) {
-    for (const std::string &value : attribute.values) {
-      m_groups.push_back(ParseGroupIdentity(value));
-    }
-  } else if (SamlAttributeIsSolution(attribute)) {
-    m_solution = ParseIsSolutionAttribute(attribute);
-  } else if (SamlAttributeIsGivenName(attribute)) {
-    m_fullName.first = ParsePrincipalNameAttribute(attribute);
-  } else if (SamlAttributeIsSurName(attribute)) {
-    m_fullName.second = ParsePrincipalNameAttribute(attribute);
   }
 }
 

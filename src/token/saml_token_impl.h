@@ -4,7 +4,7 @@
 
 #pragma once
 
-#include "token/assertion_model.h"
+#include "token/token_facts.h"
 
 #include <ssoclient/saml_token.h>
 #include <tarvel/xml/security/key_info_resolver.h>
@@ -24,23 +24,23 @@ public:
   SamlTokenImpl(const Tarvel::Xml::ElementNode &element, const Tarvel::Xml::Security::KeyInfoResolver &resolver,
                 std::int64_t clockToleranceSec);
 
-  const std::string &GetId() const override { return m_id; }
-  const Tarvel::System::DateTime &GetStartDate() const override { return m_startDate; }
-  const Tarvel::System::DateTime &GetEndDate() const override { return m_endDate; }
-  const PrincipalId &GetSubject() const override { return m_subject; }
-  bool IsRenewable() const override { return m_renewable; }
-  bool IsDelegable() const override { return m_delegable; }
-  bool IsSolution() const override { return m_solution; }
-  ConfirmationType GetConfirmationMethod() const override { return m_confirmationMethod; }
-  void GetFullName(std::pair<std::string, std::string> &fullName) const override { fullName = m_fullName; }
-  void GetGroups(std::vector<PrincipalId> &groups) const override { groups = m_groups; }
+  const std::string &GetId() const override { return m_facts.id; }
+  const Tarvel::System::DateTime &GetStartDate() const override { return m_facts.startDate; }
+  const Tarvel::System::DateTime &GetEndDate() const override { return m_facts.endDate; }
+  const PrincipalId &GetSubject() const override { return m_facts.subject; }
+  bool IsRenewable() const override { return m_facts.renewable; }
+  bool IsDelegable() const override { return m_facts.delegable; }
+  bool IsSolution() const override { return m_facts.solution; }
+  ConfirmationType GetConfirmationMethod() const override { return m_facts.confirmationMethod; }
+  void GetFullName(std::pair<std::string, std::string> &fullName) const override { fullName = m_facts.fullName; }
+  void GetGroups(std::vector<PrincipalId> &groups) const override { groups = m_facts.groups; }
   void GetDelegationChain(std::vector<Delegate> &delegationChain) const override {
-    delegationChain = m_delegationChain;
+    delegationChain = m_facts.delegationChain;
   }
-  void GetAudience(std::set<std::string> &audience) const override { audience = m_audience; }
-  void GetAdvice(std::vector<Advice> &advice) const override { advice = m_advice; }
+  void GetAudience(std::set<std::string> &audience) const override { audience = m_facts.audience; }
+  void GetAdvice(std::vector<Advice> &advice) const override { advice = m_facts.advice; }
   const Tarvel::Crypto::Certificate *GetConfirmationCertificate() const override {
-    return m_confirmationCertificate.get();
+    return m_facts.confirmationCertificate.get();
   }
   const std::string &ToXml() const override { return m_xml; }
 
@@ -51,25 +51,9 @@ public:
 private:
   void InitializeFromDom(const Tarvel::Xml::ElementNode *element,
                          const Tarvel::Xml::Security::KeyInfoResolver &resolver, std::int64_t clockToleranceSec);
-  void PopulateSubject(SubjectType &subject);
-  void PopulateConditions(ConditionsType &conditions);
-  void PopulateTokenAttribute(const AttributeType &attribute);
 
   std::string m_xml;
-  std::string m_id;
-  Tarvel::System::DateTime m_startDate;
-  Tarvel::System::DateTime m_endDate;
-  PrincipalId m_subject;
-  bool m_renewable = false;
-  bool m_delegable = false;
-  bool m_solution = false;
-  std::pair<std::string, std::string> m_fullName;
-  std::vector<PrincipalId> m_groups;
-  std::vector<Delegate> m_delegationChain;
-  std::set<std::string> m_audience;
-  std::vector<Advice> m_advice;
-  ConfirmationType m_confirmationMethod = BEARER;
-  Tarvel::Ref<const Tarvel::Crypto::Certificate> m_confirmationCertificate;
+  TokenFacts m_facts;
 };
 
 } // namespace SsoClient

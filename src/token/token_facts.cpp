@@ -6,6 +6,7 @@
 #include <tarvel/core/string_util.h>
 
 #include <string_view>
+#include <utility>
 
 namespace SsoClient {
 
@@ -24,7 +25,60 @@ bool PartsInTwo(const std::string &text, std::size_t separator) {
   return separator != std::string::npos && separator != 0 && separator + 1 != text.size();
 }
 
+/// Whether a restriction allows it at least once more. One without a number allows nothing.
+template <typename Restriction>
+bool Allows(const boost::optional<Restriction> &restriction) {
+  return restriction && restriction->Count && *restriction->Count != 0;
+}
+
+void TakeConditions(ConditionsType &conditions, TokenFacts &facts) {
+  facts.startDate = conditions.NotBefore;
+  facts.endDate = conditions.NotOnOrAfter;
+  facts.renewable = Allows(conditions.RenewRestriction);
+  facts.delegable = Allows(conditions.ProxyRestriction);
+  if (conditions.DelegationRestriction) {
+    for (const DelegateType &delegate : conditions.DelegationRestriction->delegates) {
+      facts.delegationChain.push_back(ParseToDelegate(delegate));
+    }
+  }
+  if (conditions.AudienceRestriction) {
+    facts.audience = std::move(conditions.AudienceRestriction->audiences);
+  }
+}
+
+void PopulateTokenAttribute(const AttributeType &attribute, TokenFacts &facts) {
+  if (SamlAttributeIsGroupIdentity(attribute)) {
+    for (const std::string &value : attribute.values) {
+      facts.groups.push_back(ParseGroupIdentity(value));
+    }
+  } else if (SamlAttributeIsSolution(attribute)) {
+    facts.solution = ParseIsSolutionAttribute(attribute);
+  } else if (SamlAttributeIsGivenName(attribute)) {
+    facts.fullName.first = ParsePrincipalNameAttribute(attribute);
+  } else if (SamlAttributeIsSurName(attribute)) {
+    facts.fullName.second = ParsePrincipalNameAttribute(attribute);
+  }
+}
+
 } // namespace
+
+TokenFacts TakeTokenFacts(SamlAssertionType &&assertion) {
+  TokenFacts facts;
+  facts.id = std::move(assertion.ID);
+  facts.subject = ParseSamlNameId(assertion.Subject.NameID);
+  facts.confirmationMethod = assertion.Subject.SubjectConfirmation.Method;
+  facts.confirmationCertificate = std::move(assertion.Subject.SubjectConfirmation.SubjectConfirmationData.certificate);
+  if (assertion.Advice) {
+    facts.advice = std::move(assertion.Advice->advice);
+  }
+  if (assertion.AttributeStatement) {
+    for (const AttributeType &attribute : assertion.AttributeStatement->attributes) {
+      PopulateTokenAttribute(attribute, facts);
+    }
+  }
+  TakeConditions(assertion.Conditions, facts);
+  return facts;
+}
 
 bool SamlAttributeIsGroupIdentity(const AttributeType &attribute) {
   return attribute.Name == GROUP_IDENTITY;

@@ -1,17 +1,47 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// What a token says about its subject: readers of names, groups, delegates and attributes.
+/// `TokenFacts`, what a token says, and the readers of its names, groups, delegates and attributes.
 
 #pragma once
 
 #include "token/assertion_model.h"
 
+#include <ssoclient/advice.h>
 #include <ssoclient/delegate.h>
 #include <ssoclient/principal_id.h>
+#include <ssoclient/saml_token.h>
+#include <tarvel/core/ref.h>
+#include <tarvel/crypto/certificate.h>
+#include <tarvel/system/date_time.h>
 
+#include <set>
 #include <string>
+#include <utility>
+#include <vector>
 
 namespace SsoClient {
+
+/// What an assertion says, whether or not somebody vouches for it.
+struct TokenFacts {
+  std::string id;
+  Tarvel::System::DateTime startDate;
+  Tarvel::System::DateTime endDate;
+  PrincipalId subject;
+  bool renewable = false;
+  bool delegable = false;
+  bool solution = false;
+  std::pair<std::string, std::string> fullName; ///< first name and last name
+  std::vector<PrincipalId> groups;
+  std::vector<Delegate> delegationChain;
+  std::set<std::string> audience;
+  std::vector<Advice> advice;
+  SamlToken::ConfirmationType confirmationMethod = SamlToken::BEARER;
+  Tarvel::Ref<const Tarvel::Crypto::Certificate> confirmationCertificate; ///< null for bearer
+};
+
+/// The facts that `assertion` states; it is used up. Neither its dates nor its signature are judged here.
+/// @throws ParseException when a name, a group or the solution attribute is not of its form.
+TokenFacts TakeTokenFacts(SamlAssertionType &&assertion);
 
 /// Which of the attributes that mean something to the token this is, by its `Name`.
 bool SamlAttributeIsGroupIdentity(const AttributeType &attribute);
