@@ -27,7 +27,8 @@ private:
   std::string m_text;
 };
 
-/// What `function` returns; its `CryptoException` comes as the same class, the message beginning with `path`.
+/// What `function` returns; its `CryptoException` or `IOException` comes as the same class, the message beginning with
+/// `path`.
 template <typename Function>
 auto NamingPath(const std::string &path, Function function) {
   try {
@@ -38,6 +39,8 @@ auto NamingPath(const std::string &path, Function function) {
     throw NoKeyException(path + ": " + error.what());
   } catch (const CryptoException &error) {
     throw CryptoException(path + ": " + error.what());
+  } catch (const IOException &error) {
+    throw IOException(path + ": " + error.what());
   }
 }
 

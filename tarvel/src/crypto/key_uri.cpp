@@ -44,21 +44,28 @@ int AnswerPassphrase(char *buffer, int size, int, void *data) noexcept {
 }
 
 [[noreturn]] void ThrowStoreFailure(const OpenSslErrorScope &errors, const PassphraseQuestion &question) {
+  constexpr const char *NOT_READABLE = "The key store cannot be read";
   if (question.failure) {
     std::rethrow_exception(question.failure);
   }
   if (question.asked) {
     throw WrongPassphraseException(errors.Describe("The passphrase of the private key is wrong"));
   }
-  errors.Throw("The key store cannot be read");
+  if (ERR_SYSTEM_ERROR(errors.PeekNewest())) {
+    throw IOException(errors.Describe(NOT_READABLE));
+  }
+  errors.Throw(NOT_READABLE);
 }
 
 // Null at the end of the store.
 KeyHandle LoadNextKey(OSSL_STORE_CTX *store, const OpenSslErrorScope &errors, const PassphraseQuestion &question) {
   while (!OSSL_STORE_eof(store)) {
     const StoreInfoHandle info(OSSL_STORE_load(store));
-    if (!info && (OSSL_STORE_error(store) || question.failure)) {
+    if (!info && (errors.PeekNewest() != 0 || question.failure)) {
       ThrowStoreFailure(errors, question);
+    }
+    if (!info && OSSL_STORE_error(store)) {
+      return nullptr; // without an error's code: what is there is something else than a key
     }
     if (info && OSSL_STORE_INFO_get_type(info.get()) == OSSL_STORE_INFO_PKEY) {
       return KeyHandle(OSSL_STORE_INFO_get1_PKEY(info.get()));

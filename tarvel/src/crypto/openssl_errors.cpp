@@ -26,7 +26,10 @@ std::string DescribeError(unsigned long code, const char *data, int flags) {
 
 } // namespace
 
-OpenSslErrorScope::OpenSslErrorScope() noexcept : m_hostHadErrors(ERR_peek_error() != 0) {
+OpenSslErrorScope::OpenSslErrorScope() noexcept {
+  if (ERR_peek_last_error_all(&m_newestOfHost, nullptr, nullptr, nullptr, nullptr) == 0) {
+    m_newestOfHost = nullptr;
+  }
   ERR_set_mark();
 }
 
@@ -35,12 +38,19 @@ OpenSslErrorScope::~OpenSslErrorScope() {
   ERR_pop_to_mark();
 }
 
+unsigned long OpenSslErrorScope::PeekNewest() const noexcept {
+  const char *entry = nullptr;
+  const unsigned long newest = ERR_peek_last_error_all(&entry, nullptr, nullptr, nullptr, nullptr);
+  return newest != 0 && entry == m_newestOfHost ? 0 : newest;
+}
+
 std::string OpenSslErrorScope::TakeText() const {
   const char *data = nullptr;
   int flags = 0;
-  if (m_hostHadErrors) {
-    const unsigned long newest = ERR_peek_last_error_data(&data, &flags);
-    return DescribeError(newest, data, flags);
+  if (m_newestOfHost) {
+    const unsigned long newest = PeekNewest();
+    ERR_peek_last_error_data(&data, &flags);
+    return newest == 0 ? std::string() : DescribeError(newest, data, flags);
   }
   std::string text;
   while (const unsigned long code = ERR_get_error_all(nullptr, nullptr, nullptr, &data, &flags)) {

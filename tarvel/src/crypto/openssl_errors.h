@@ -17,6 +17,9 @@ public:
   OpenSslErrorScope &operator=(const OpenSslErrorScope &) = delete;
   ~OpenSslErrorScope();
 
+  /// OpenSSL's code for the newest error since the scope began; 0 when there is none.
+  unsigned long PeekNewest() const noexcept;
+
   /// OpenSSL's own words for all errors since the scope began, oldest first, which takes them off the queue. When the
   /// host had left errors there, only the newest, for the older ones cannot be read without taking the host's.
   std::string TakeText() const;
@@ -28,7 +31,7 @@ public:
   std::string Describe(const std::string &message) const;
 
 private:
-  const bool m_hostHadErrors;
+  const char *m_newestOfHost = nullptr; // an entry's own copy of a file name, and so its identity; null for none
 };
 
 } // namespace Tarvel::Crypto

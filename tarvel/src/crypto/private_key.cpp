@@ -11,6 +11,7 @@
 #include "crypto/pem_reader.h"
 #include "crypto/private_key_impl.h"
 
+#include <openssl/err.h>
 #include <openssl/pem.h>
 
 #include <algorithm>
@@ -20,6 +21,7 @@ namespace Tarvel::Crypto {
 namespace {
 
 constexpr const char *NO_KEY = "There is no private key in the text";
+constexpr const char *KEY_DOES_NOT_DECODE = "The private key does not decode";
 constexpr const char *WRONG_PASSPHRASE = "The passphrase of the private key is wrong";
 
 const unsigned char *BytesOf(std::string_view der) {
@@ -50,15 +52,20 @@ EncryptedKeyHandle DecodeEncrypted(std::string_view der) {
   return encrypted && position == BytesOf(der) + der.size() ? std::move(encrypted) : nullptr;
 }
 
-// A passphrase shows that it is wrong by padding that does not come out, or, one time in 256, by a key that does not
-// decode.
+// A wrong passphrase shows by padding that does not come out, or, one time in 256, by a key that does not decode.
 KeyHandle Decrypt(const X509_SIG *encrypted, Passphrase &passphrase) {
   const std::string &secret = passphrase.Get();
   const OpenSslErrorScope errors;
   const PlainKeyHandle plain(PKCS8_decrypt(encrypted, secret.data(), static_cast<int>(secret.size())));
-  KeyHandle key(plain ? EVP_PKCS82PKEY(plain.get()) : nullptr);
-  if (!key) {
+  if (!plain && ERR_GET_REASON(errors.PeekNewest()) == ERR_R_UNSUPPORTED) {
+    errors.Throw("The private key cannot be decrypted");
+  }
+  if (!plain) {
     throw WrongPassphraseException(errors.Describe(WRONG_PASSPHRASE));
+  }
+  KeyHandle key(EVP_PKCS82PKEY(plain.get()));
+  if (!key) {
+    errors.Throw(KEY_DOES_NOT_DECODE);
   }
   return key;
 }
@@ -105,7 +112,7 @@ KeyHandle DecodeBlock(PemBlock &block, Passphrase &passphrase) {
     throw WrongPassphraseException(errors.Describe(WRONG_PASSPHRASE));
   }
   if (!key) {
-    errors.Throw("The private key does not decode");
+    errors.Throw(KEY_DOES_NOT_DECODE);
   }
   return key;
 }
@@ -139,7 +146,7 @@ KeyHandle DecodeDer(std::string_view der, Passphrase &passphrase) {
   if (IsCertificateInDer(der)) {
     throw NoKeyException("There is a certificate, and no private key");
   }
-  errors.Throw("The private key does not decode");
+  errors.Throw(KEY_DOES_NOT_DECODE);
 }
 
 } // namespace
