@@ -58,18 +58,23 @@ public:
   virtual bool Verify(const KeyInfoResolver &resolver, std::set<std::string> &signedUris) const = 0;
 
   /// Adds a reference to be signed, with one transform.
-  /// @throws XmlSecurityException for an algorithm that the profile does not sign with.
+  /// @throws XmlSecurityException for a transform other than exclusive canonicalisation without comments, or a digest other
+  ///         than SHA-256/384/512. @throws InvalidStateException after `Sign`, and for a signature taken from a tree.
   virtual void AddReference(std::string_view uri, std::string_view digestUri, std::string_view transformUri) = 0;
 
-  /// Makes `content` the only child of the signature's `ds:KeyInfo`.
+  /// Makes `content` the only child of the signature's `ds:KeyInfo`; it is put there by `Sign`.
+  /// @throws InvalidStateException after `Sign`, and for a signature taken from a tree.
   virtual void SetKeyInfo(const Ref<ElementNode> &content) = 0;
 
   /// Computes the digests over the tree as it is now, and the signature value. The signature element must then be put
   /// into the tree; the place must not change the namespaces that its `SignedInfo` sees under exclusive canonicalisation.
-  /// @throws XmlSecurityException when a reference does not resolve, or the key cannot sign with the algorithm.
+  /// @throws XmlSecurityException when there is no reference, one does not resolve, or the key cannot sign with the
+  ///         algorithm; the signature then stays blank. @throws InvalidStateException after `Sign`, for a key info content
+  ///         that has a parent, and for a signature taken from a tree.
   virtual void Sign(const Crypto::PrivateKey &key) = 0;
 
-  /// The `ds:Signature` element; for a blank signature it is complete after `Sign`.
+  /// The `ds:Signature` element that `Sign` made.
+  /// @throws InvalidStateException before `Sign`, and for a signature taken from a tree.
   virtual Ref<ElementNode> GetElement() const = 0;
 
 protected:
@@ -79,7 +84,15 @@ protected:
 /// Reads the signature element `signature` for verification. References resolve in the document (or topmost element) that
 /// holds `root`; the enveloped-signature transform takes out this very signature element and no other.
 /// Both elements' tree is kept alive by the signature and must not be changed while it is used.
-/// @throws SignatureSyntaxException when the element is not a well-formed `ds:Signature` of the profile's shape.
+///
+/// This judges syntax alone, so that `GetReferences` can tell what a signature claims to cover before anything is computed.
+/// Syntax is: elements of the ds namespace in the order of XML Signature, no attribute but those it gives them, an
+/// `Algorithm` wherever one belongs, a `URI` on each reference (one left out could be taken for ""), digest and signature
+/// values that are Base64 text and nothing else, white space and comments alone between elements. What is outside the
+/// profile though well-formed is refused by `Verify`: an unknown algorithm or parameter, `ds:Object`, a reference's `Type`,
+/// no reference at all or more than ten, more than two transforms or a second one after a canonicalisation, an URI that is
+/// neither "" nor a bare name.
+/// @throws SignatureSyntaxException naming what is wrong and where.
 TARVEL_API void CreateSignatureFromDom(const ElementNode &root, const ElementNode &signature, Ref<Signature> &out);
 
 /// A blank signature to be filled and signed; its references resolve in the tree of `root`. Its elements have the prefix

@@ -1,0 +1,35 @@
+// SPDX-License-Identifier: Apache-2.0
+/// @file
+/// Canonical XML 1.0 and Exclusive XML Canonicalization 1.0 of a subtree.
+
+#pragma once
+
+#include <tarvel/io/writer.h>
+#include <tarvel/xml/node.h>
+
+#include <string>
+#include <string_view>
+#include <vector>
+
+namespace Tarvel::Xml::Security {
+
+/// One of the four algorithms, with its parameter.
+struct CanonicalMethod {
+  bool isExclusive = false;
+  bool withComments = false;
+  std::vector<std::string> inclusivePrefixes; ///< exclusive only; sorted; the empty prefix is the default namespace
+};
+
+/// The method that an algorithm URI names; its `inclusivePrefixes` are left empty. @return whether the URI is known.
+bool FindCanonicalMethod(std::string_view algorithmUri, CanonicalMethod &method);
+
+/// Sets the prefixes of an InclusiveNamespaces PrefixList, in which "#default" stands for the default namespace.
+void SetInclusivePrefixes(CanonicalMethod &method, std::vector<std::string> prefixList);
+
+/// Writes the canonical form of the subtree at `apex`, without the subtree at `omitted` (may be null). No recursion; the
+/// cost is linear in the size of the subtree and of what is written.
+/// @throws XmlSecurityException when the tree has no canonical form: an unbound prefix, a relative or undeclaring
+///         namespace name, an attribute that stands twice; or when it is beyond the limits at the top of the source file.
+void WriteCanonicalForm(const Node &apex, const CanonicalMethod &method, const Node *omitted, Writer &writer);
+
+} // namespace Tarvel::Xml::Security

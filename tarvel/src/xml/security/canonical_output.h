@@ -1,0 +1,56 @@
+// SPDX-License-Identifier: Apache-2.0
+/// @file
+/// `CanonicalOutput`, which gathers canonical octets into pieces worth passing on, and escapes what must be escaped.
+
+#pragma once
+
+#include <tarvel/io/writer.h>
+
+#include <array>
+#include <cstddef>
+#include <cstring>
+#include <string_view>
+
+namespace Tarvel::Xml::Security {
+
+/// A buffer before a `Writer`. For one thread.
+class CanonicalOutput {
+public:
+  explicit CanonicalOutput(Writer &writer) noexcept : m_writer(writer) {}
+  CanonicalOutput(const CanonicalOutput &) = delete;
+  CanonicalOutput &operator=(const CanonicalOutput &) = delete;
+
+  /// @throws XmlSecurityException when the octets altogether pass the limit.
+  void Put(std::string_view octets) {
+    if (octets.size() > m_buffer.size() - m_used) {
+      PutPastBuffer(octets);
+      return;
+    }
+    std::memcpy(m_buffer.data() + m_used, octets.data(), octets.size());
+    m_used += octets.size();
+  }
+
+  void Put(char octet) { Put(std::string_view(&octet, 1)); }
+
+  /// Character data: ampersand, angle brackets and carriage return escaped.
+  void PutText(std::string_view text);
+
+  /// The inside of an attribute value: ampersand, "less than", quotation mark, tab, line feed and carriage return escaped.
+  void PutAttributeValue(std::string_view value);
+
+  /// Passes on what is held back; to be called at the end.
+  void Flush();
+
+private:
+  static constexpr std::size_t BUFFER_BYTES = 4096;
+
+  void PutPastBuffer(std::string_view octets);
+  void Count(std::size_t octets);
+
+  Writer &m_writer;
+  std::array<char, BUFFER_BYTES> m_buffer;
+  std::size_t m_used = 0;
+  std::size_t m_total = 0;
+};
+
+} // namespace Tarvel::Xml::Security

@@ -1,0 +1,49 @@
+// SPDX-License-Identifier: Apache-2.0
+
+#include <tarvel/xml/security/canonicalizer.h>
+
+#include "xml/security/canonical_form.h"
+
+#include <tarvel/xml/security/exceptions.h>
+
+#include <utility>
+
+namespace Tarvel {
+namespace Xml {
+namespace Security {
+
+namespace {
+
+class CanonicalizerImpl final : public Canonicalizer {
+public:
+  explicit CanonicalizerImpl(CanonicalMethod method) : m_method(std::move(method)) {}
+
+  void Canonicalize(const Node &node, Writer &writer) const override {
+    WriteCanonicalForm(node, m_method, nullptr, writer);
+  }
+
+private:
+  const CanonicalMethod m_method;
+};
+
+} // namespace
+
+Canonicalizer::~Canonicalizer() = default;
+
+Ref<Canonicalizer> CreateCanonicalizer(std::string_view algorithmUri,
+                                       const std::vector<std::string> &inclusivePrefixes) {
+  CanonicalMethod method;
+  if (!FindCanonicalMethod(algorithmUri, method)) {
+    throw XmlSecurityException("The canonicalization algorithm \"" + std::string(algorithmUri) + "\" is not accepted");
+  }
+  if (!method.isExclusive && !inclusivePrefixes.empty()) {
+    throw XmlSecurityException("The canonicalization algorithm \"" + std::string(algorithmUri) +
+                               "\" takes no list of inclusive namespaces");
+  }
+  SetInclusivePrefixes(method, inclusivePrefixes);
+  return MakeRef<CanonicalizerImpl>(std::move(method));
+}
+
+} // namespace Security
+} // namespace Xml
+} // namespace Tarvel

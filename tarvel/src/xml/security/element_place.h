@@ -1,0 +1,21 @@
+// SPDX-License-Identifier: Apache-2.0
+/// @file
+/// Where an element stands, as the end of a message.
+
+#pragma once
+
+#include <tarvel/xml/node.h>
+
+#include <string>
+
+namespace Tarvel::Xml::Security {
+
+/// " at line L, column C", or nothing for an element that was not parsed.
+inline std::string PlaceOf(const ElementNode &element) {
+  if (element.GetLine() == 0) {
+    return {};
+  }
+  return " at line " + std::to_string(element.GetLine()) + ", column " + std::to_string(element.GetColumn());
+}
+
+} // namespace Tarvel::Xml::Security

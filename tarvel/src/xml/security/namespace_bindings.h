@@ -1,0 +1,71 @@
+// SPDX-License-Identifier: Apache-2.0
+/// @file
+/// `NamespaceBindings`, the namespaces in scope while a tree is walked, and what of them the output has declared.
+
+#pragma once
+
+#include <array>
+#include <cstddef>
+#include <cstdint>
+#include <string_view>
+#include <vector>
+
+namespace Tarvel::Xml::Security {
+
+/// A stack of prefix bindings with constant-time look-up. The default namespace has the empty prefix; it is bound to the
+/// empty name, and "xml" to its fixed name, before anything is declared. Texts belong to the caller. For one thread.
+class NamespaceBindings {
+public:
+  struct Binding {
+    std::string_view prefix;
+    std::string_view uri;
+    std::string_view written; ///< what the output around this place binds the prefix to; meaningful when `isWritten`
+    bool isWritten = false;
+    std::uint32_t bucket = 0;
+    std::uint32_t next = 0; ///< the binding below it in its bucket
+  };
+
+  /// A state to go back to.
+  struct Mark {
+    std::size_t bindings;
+    std::size_t changes;
+  };
+
+  NamespaceBindings();
+
+  /// Binds `prefix` from here on; the output's state for the prefix stays what it is.
+  void Declare(std::string_view prefix, std::string_view uri);
+
+  /// The index of the binding in force for `prefix`, or `NOT_BOUND`.
+  std::size_t Find(std::string_view prefix) const noexcept;
+
+  const Binding &operator[](std::size_t index) const noexcept { return m_bindings[index]; }
+  std::size_t Size() const noexcept { return m_bindings.size(); }
+
+  /// Notes that the output binds the prefix as the source does. @return whether the output did not do so already, so that
+  /// a declaration has to be written.
+  bool Write(std::size_t index);
+
+  Mark GetMark() const noexcept { return {m_bindings.size(), m_changes.size()}; }
+  void GoBack(Mark mark) noexcept;
+
+  static constexpr std::size_t NOT_BOUND = SIZE_MAX;
+
+private:
+  static constexpr std::uint32_t END_OF_BUCKET = UINT32_MAX;
+  static constexpr std::uint32_t BUCKETS = 128; // a power of two
+
+  struct Change {
+    std::size_t index;
+    std::string_view written;
+    bool isWritten;
+  };
+
+  static std::uint32_t BucketOf(std::string_view prefix) noexcept;
+
+  std::array<std::uint32_t, BUCKETS> m_buckets;
+  std::vector<Binding> m_bindings;
+  std::vector<Change> m_changes;
+};
+
+} // namespace Tarvel::Xml::Security

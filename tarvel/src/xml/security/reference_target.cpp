@@ -1,0 +1,118 @@
+// SPDX-License-Identifier: Apache-2.0
+
+#include "xml/security/reference_target.h"
+
+#include <tarvel/xml/security/exceptions.h>
+
+#include <string>
+
+namespace Tarvel::Xml::Security {
+
+namespace {
+
+constexpr std::string_view WSU_NAMESPACE =
+    "http://docs.oasis-open.org/wss/2004/01/oasis-200401-wss-wssecurity-utility-1.0.xsd";
+
+[[noreturn]] void Refuse(std::string_view uri, const char *why) {
+  throw XmlSecurityException("The reference URI \"" + std::string(uri) + "\" is not accepted: " + why);
+}
+
+/// The identifier behind the "#", which must be a bare name.
+std::string_view RequireIdentifier(std::string_view uri) {
+  if (uri.front() != '#') {
+    Refuse(uri, "it points outside the document");
+  }
+  if (uri.size() == 1) {
+    Refuse(uri, "it names nothing");
+  }
+  if (uri.find('(') != std::string_view::npos) {
+    Refuse(uri, "it is an XPointer");
+  }
+  return uri.substr(1);
+}
+
+bool IsIdentifier(const Attribute &attribute, const ElementNode &element) {
+  const std::string_view name = attribute.GetName();
+  if (name == "ID" || name == "Id" || name == "xml:id") {
+    return true;
+  }
+  std::string_view uri;
+  return attribute.GetLocalName() == "Id" && !attribute.IsNamespaceDeclaration() &&
+         element.LookupNamespace(attribute.GetPrefix(), uri) && uri == WSU_NAMESPACE;
+}
+
+/// Whether the element is identified by `identifier`. The value is compared first, since it rarely fits.
+bool HasIdentifier(const ElementNode &element, std::string_view identifier) {
+  for (const Attribute *attribute = element.GetFirstAttribute(); attribute; attribute = attribute->GetNext()) {
+    if (attribute->GetValue() == identifier && IsIdentifier(*attribute, element)) {
+      return true;
+    }
+  }
+  return false;
+}
+
+/// The node after `node` in document order within the tree at `top`, or null.
+const Node *NextInDocument(const Node *node, const Node *top) {
+  if (node->GetFirstChild()) {
+    return node->GetFirstChild();
+  }
+  while (node != top && !node->GetNextSibling()) {
+    node = node->GetParent();
+  }
+  return node == top ? nullptr : node->GetNextSibling();
+}
+
+struct Search {
+  std::string_view uri;
+  std::string_view identifier;
+  const Node **target;
+};
+
+void NoteMatches(const ElementNode &element, const std::vector<Search> &searches) {
+  for (const Search &search : searches) {
+    if (!HasIdentifier(element, search.identifier)) {
+      continue;
+    }
+    if (*search.target) {
+      Refuse(search.uri, "several elements have that identifier");
+    }
+    *search.target = &element;
+  }
+}
+
+void RequireFound(const Search &search, const ElementNode &root) {
+  if (!*search.target) {
+    Refuse(search.uri, "no element has that identifier");
+  }
+  if (HasIdentifier(root, search.identifier) && *search.target != &root) {
+    Refuse(search.uri, "it means another element than the one that the signature is to cover");
+  }
+}
+
+} // namespace
+
+std::vector<const Node *> ResolveReferences(const ElementNode &root, const std::vector<std::string_view> &uris) {
+  const Node *top = root.GetRoot();
+  std::vector<const Node *> targets(uris.size(), nullptr);
+  std::vector<Search> searches;
+  for (std::size_t index = 0; index < uris.size(); ++index) {
+    if (uris[index].empty()) {
+      targets[index] = top;
+      continue;
+    }
+    searches.push_back({uris[index], RequireIdentifier(uris[index]), &targets[index]});
+  }
+  if (!searches.empty()) {
+    for (const Node *node = top; node; node = NextInDocument(node, top)) {
+      if (const ElementNode *element = AsElement(node)) {
+        NoteMatches(*element, searches);
+      }
+    }
+  }
+  for (const Search &search : searches) {
+    RequireFound(search, root);
+  }
+  return targets;
+}
+
+} // namespace Tarvel::Xml::Security

@@ -1,0 +1,177 @@
+// SPDX-License-Identifier: Apache-2.0
+
+#include "xml/security/signature_profile.h"
+
+#include <tarvel/xml/security/canonicalizer.h>
+#include <tarvel/xml/security/exceptions.h>
+#include <tarvel/xml/security/signature.h>
+
+#include <string>
+#include <utility>
+
+namespace Tarvel::Xml::Security {
+
+namespace {
+
+using Crypto::DigestAlgorithm;
+using Crypto::SignatureScheme;
+
+constexpr std::size_t MAX_REFERENCES = 10;
+constexpr std::size_t MAX_TRANSFORMS = 2; // of one reference
+
+struct NamedSignatureAlgorithm {
+  std::string_view uri;
+  SignatureAlgorithm algorithm;
+};
+
+constexpr NamedSignatureAlgorithm SIGNATURE_ALGORITHMS[] = {
+    {SignatureUri::RSA_SHA256, {SignatureScheme::RSA_PKCS1, DigestAlgorithm::SHA256}},
+    {SignatureUri::RSA_SHA384, {SignatureScheme::RSA_PKCS1, DigestAlgorithm::SHA384}},
+    {SignatureUri::RSA_SHA512, {SignatureScheme::RSA_PKCS1, DigestAlgorithm::SHA512}},
+    {SignatureUri::RSA_PSS_SHA256, {SignatureScheme::RSA_PSS, DigestAlgorithm::SHA256}},
+    {SignatureUri::RSA_PSS_SHA384, {SignatureScheme::RSA_PSS, DigestAlgorithm::SHA384}},
+    {SignatureUri::RSA_PSS_SHA512, {SignatureScheme::RSA_PSS, DigestAlgorithm::SHA512}},
+    {SignatureUri::ECDSA_SHA256, {SignatureScheme::ECDSA, DigestAlgorithm::SHA256}},
+    {SignatureUri::ECDSA_SHA384, {SignatureScheme::ECDSA, DigestAlgorithm::SHA384}},
+    {SignatureUri::ECDSA_SHA512, {SignatureScheme::ECDSA, DigestAlgorithm::SHA512}},
+};
+
+struct NamedDigestAlgorithm {
+  std::string_view uri;
+  DigestAlgorithm algorithm;
+};
+
+constexpr NamedDigestAlgorithm DIGEST_ALGORITHMS[] = {
+    {SignatureUri::DIGEST_SHA256, DigestAlgorithm::SHA256},
+    {SignatureUri::DIGEST_SHA384, DigestAlgorithm::SHA384},
+    {SignatureUri::DIGEST_SHA512, DigestAlgorithm::SHA512},
+};
+
+[[noreturn]] void RefuseAlgorithm(const char *kind, std::string_view uri) {
+  throw XmlSecurityException(std::string("The ") + kind + " algorithm \"" + std::string(uri) + "\" is not accepted");
+}
+
+[[noreturn]] void RefuseParameter(std::string_view parameter, std::string_view uri) {
+  throw XmlSecurityException("The parameter \"" + std::string(parameter) + "\" of the algorithm \"" + std::string(uri) +
+                             "\" is not accepted");
+}
+
+void RequireNoParameters(const AlgorithmSyntax &syntax) {
+  if (!syntax.otherParameter.empty()) {
+    RefuseParameter(syntax.otherParameter, syntax.uri);
+  }
+  if (syntax.inclusivePrefixes) {
+    RefuseParameter("InclusiveNamespaces", syntax.uri);
+  }
+}
+
+CanonicalMethod RequireCanonicalMethod(const char *kind, const AlgorithmSyntax &syntax) {
+  CanonicalMethod method;
+  if (!FindCanonicalMethod(syntax.uri, method)) {
+    RefuseAlgorithm(kind, syntax.uri);
+  }
+  if (!method.isExclusive || !syntax.otherParameter.empty()) {
+    RequireNoParameters(syntax);
+  }
+  if (syntax.inclusivePrefixes) {
+    SetInclusivePrefixes(method, *syntax.inclusivePrefixes);
+  }
+  return method;
+}
+
+SignatureAlgorithm RequireSignatureAlgorithm(const AlgorithmSyntax &syntax) {
+  const std::optional<SignatureAlgorithm> algorithm = FindSignatureAlgorithm(syntax.uri);
+  if (!algorithm) {
+    RefuseAlgorithm("signature", syntax.uri);
+  }
+  RequireNoParameters(syntax);
+  return *algorithm;
+}
+
+DigestAlgorithm RequireDigestAlgorithm(const AlgorithmSyntax &syntax) {
+  const std::optional<DigestAlgorithm> algorithm = FindDigestAlgorithm(syntax.uri);
+  if (!algorithm) {
+    RefuseAlgorithm("digest", syntax.uri);
+  }
+  RequireNoParameters(syntax);
+  return *algorithm;
+}
+
+/// At most the enveloped-signature transform, then at most one canonicalisation: what comes after that would have to parse
+/// octets again.
+void PlanTransforms(const std::vector<AlgorithmSyntax> &transforms, ReferencePlan &plan) {
+  if (transforms.size() > MAX_TRANSFORMS) {
+    throw XmlSecurityException("A reference has " + std::to_string(transforms.size()) + " transforms; at most " +
+                               std::to_string(MAX_TRANSFORMS) + " are accepted");
+  }
+  bool isCanonical = false;
+  for (const AlgorithmSyntax &transform : transforms) {
+    const bool isEnveloped = transform.uri == SignatureUri::ENVELOPED_SIGNATURE;
+    if (isCanonical || (isEnveloped && plan.omitsSignature)) {
+      throw XmlSecurityException("The transform \"" + std::string(transform.uri) + "\" is not accepted after \"" +
+                                 std::string(transforms.front().uri) + "\"");
+    }
+    if (isEnveloped) {
+      RequireNoParameters(transform);
+      plan.omitsSignature = true;
+      continue;
+    }
+    plan.method = RequireCanonicalMethod("transform", transform);
+    isCanonical = true;
+  }
+}
+
+ReferencePlan PlanReference(const ReferenceSyntax &syntax) {
+  if (syntax.type) {
+    throw XmlSecurityException("A reference of the type \"" + std::string(*syntax.type) + "\" is not accepted");
+  }
+  ReferencePlan plan;
+  PlanTransforms(syntax.transforms, plan);
+  // XML Signature, sections 4.4.3.2 and 4.4.3.3: "" and "#x" select a node set without comments, whatever canonicalises it.
+  plan.method.withComments = false;
+  plan.digest = RequireDigestAlgorithm(syntax.digestMethod);
+  return plan;
+}
+
+} // namespace
+
+std::optional<SignatureAlgorithm> FindSignatureAlgorithm(std::string_view uri) {
+  for (const NamedSignatureAlgorithm &named : SIGNATURE_ALGORITHMS) {
+    if (named.uri == uri) {
+      return named.algorithm;
+    }
+  }
+  return std::nullopt;
+}
+
+std::optional<Crypto::DigestAlgorithm> FindDigestAlgorithm(std::string_view uri) {
+  for (const NamedDigestAlgorithm &named : DIGEST_ALGORITHMS) {
+    if (named.uri == uri) {
+      return named.algorithm;
+    }
+  }
+  return std::nullopt;
+}
+
+SignaturePlan RequireProfile(const SignatureSyntax &syntax) {
+  if (syntax.hasObject) {
+    throw XmlSecurityException("A signature with ds:Object is not accepted");
+  }
+  if (syntax.references.empty()) {
+    throw XmlSecurityException("The signature has no reference");
+  }
+  if (syntax.references.size() > MAX_REFERENCES) {
+    throw XmlSecurityException("The signature has " + std::to_string(syntax.references.size()) +
+                               " references; at most " + std::to_string(MAX_REFERENCES) + " are accepted");
+  }
+  SignaturePlan plan{RequireCanonicalMethod("canonicalization", syntax.canonicalizationMethod),
+                     RequireSignatureAlgorithm(syntax.signatureMethod),
+                     {}};
+  plan.references.reserve(syntax.references.size());
+  for (const ReferenceSyntax &reference : syntax.references) {
+    plan.references.push_back(PlanReference(reference));
+  }
+  return plan;
+}
+
+} // namespace Tarvel::Xml::Security
