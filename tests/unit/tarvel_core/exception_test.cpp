@@ -10,6 +10,8 @@
 #include <memory>
 #include <thread>
 #include <type_traits>
+#include <typeinfo>
+#include <utility>
 
 namespace Tarvel {
 namespace {
@@ -45,10 +47,11 @@ TYPED_TEST(ExceptionClass, CloneOfABaseReferenceKeepsTheDynamicClassAndTheMessag
   const TypeParam original("detail");
   const Exception &held = original;
   const std::unique_ptr<Exception> clone(held.Clone());
-  EXPECT_NE(clone.get(), &held);
-  EXPECT_TRUE(typeid(*clone) == typeid(TypeParam));
-  EXPECT_STREQ(clone->what(), original.what());
-  EXPECT_EQ(clone->GetBacktrace(), original.GetBacktrace());
+  const Exception &copy = *clone;
+  EXPECT_NE(&copy, &held);
+  EXPECT_TRUE(typeid(copy) == typeid(TypeParam));
+  EXPECT_STREQ(copy.what(), original.what());
+  EXPECT_EQ(copy.GetBacktrace(), original.GetBacktrace());
 }
 
 TYPED_TEST(ExceptionClass, ThrowOfABaseReferenceRaisesTheDynamicClass) {

@@ -19,8 +19,9 @@ class TARVEL_API StringUtil {
 public:
   StringUtil() = delete;
 
-  /// The upper-case form of UTF-8 text by Unicode's simple case mapping (one character to one character). Bytes that are
-  /// not UTF-8 stay as they are.
+  /// The upper-case form of UTF-8 text by Unicode's simple case mapping (one character to one character), as the C
+  /// library's locale C.UTF-8 has it; on a system without that locale only ASCII letters are mapped. Bytes that are not
+  /// UTF-8 stay as they are.
   static std::string ToUpper(std::string_view text);
 
   /// The lower-case form, likewise.
