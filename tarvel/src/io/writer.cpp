@@ -2,19 +2,40 @@
 
 #include <tarvel/io/writer.h>
 
+#include <tarvel/core/secure_wipe.h>
+
+#include <algorithm>
+#include <cstddef>
 #include <utility>
 
 namespace Tarvel {
 
 namespace {
 
+/// What is written may be a request with a password in it, so no copy of it is left behind in the heap: neither the text
+/// that was not taken, nor the shorter memory that it outgrew.
 class StringWriterImpl final : public StringWriter {
 public:
-  void Write(std::string_view bytes) override { m_text += bytes; }
+  ~StringWriterImpl() override { SecureWipe(m_text); }
+
+  void Write(std::string_view bytes) override {
+    if (m_text.capacity() - m_text.size() < bytes.size()) {
+      Grow(bytes.size());
+    }
+    m_text += bytes;
+  }
   const std::string &GetText() const override { return m_text; }
   std::string TakeText() override { return std::exchange(m_text, std::string()); }
 
 private:
+  void Grow(std::size_t bytes) {
+    std::string larger;
+    larger.reserve(std::max(2 * m_text.capacity(), m_text.size() + bytes));
+    larger += m_text;
+    m_text.swap(larger);
+    SecureWipe(larger);
+  }
+
   std::string m_text;
 };
 
