@@ -1,0 +1,24 @@
+// SPDX-License-Identifier: Apache-2.0
+/// @file
+/// The advice that a request asks the service to put into the token.
+
+#pragma once
+
+#include "compose/xml_builder.h"
+
+#include <ssoclient/advice.h>
+
+#include <vector>
+
+namespace SsoClient {
+
+/// `rsa-advice:AdviceSet`, which declares every prefix that is used in it, with one `rsa-advice:Advice` per entry.
+XMLBuilderPtr RsaAdviceSetBuilder(const std::vector<Advice> &advices);
+
+/// `rsa-advice:Advice` of one source, with one `rsa-advice:Attribute` per attribute.
+XMLBuilderPtr RsaAdviceBuilder(const Advice &advice);
+
+/// `rsa-advice:Attribute` with its values in order, each typed "xs:string".
+XMLBuilderPtr RsaAttributeBuilder(const AdviceAttribute &attribute);
+
+} // namespace SsoClient

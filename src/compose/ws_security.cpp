@@ -1,0 +1,91 @@
+// SPDX-License-Identifier: Apache-2.0
+#include "compose/ws_security.h"
+
+#include "compose/wire_names.h"
+#include "model/namespaces.h"
+#include "xml/date_time_text.h"
+#include "xml/parse_xml.h"
+
+#include <tarvel/core/string_util.h>
+#include <tarvel/system/date_time.h>
+#include <tarvel/xml/document.h>
+
+namespace SsoClient {
+
+namespace {
+
+std::string EncodeBase64(const Tarvel::Crypto::Certificate &certificate) {
+  const auto &der = certificate.GetDer();
+  std::string text(Tarvel::Base64_EncodedLength(der.size()), '\0');
+  text.resize(Tarvel::Base64_Encode(der.data(), der.size(), text.data()));
+  return text;
+}
+
+} // namespace
+
+XMLCompositePtr WsSecurityHeaderBuilder(int minutes) {
+  auto header = std::make_shared<XMLCompositeBuilder>(
+      ElementBuilder("wsse", "Security", {{"xmlns:wsse", std::string(Namespaces::WSSE)}}));
+  header->Add(WssuTimestampBuilder(minutes));
+  return header;
+}
+
+XMLCompositePtr WssuTimestampBuilder(int minutes) {
+  const Tarvel::System::DateTime now = Tarvel::System::GetUtcDateTime();
+  const Tarvel::System::DateTime expires = AddMinutesToDate(now, minutes);
+  auto timestamp = std::make_shared<XMLCompositeBuilder>(
+      ElementBuilder("wsu", "Timestamp", {{"xmlns:wsu", std::string(Namespaces::WSU)}}));
+  timestamp->Add(TextElementBuilder("wsu", "Created", DateTimeFormatter(now)))
+      .Add(TextElementBuilder("wsu", "Expires", DateTimeFormatter(expires)));
+  return timestamp;
+}
+
+XMLCompositePtr WsseUsernameTokenBuilder(const std::string &user) {
+  auto token = std::make_shared<XMLCompositeBuilder>(
+      ElementBuilder("wsse", "UsernameToken", {{"xmlns:wsse", std::string(Namespaces::WSSE)}}));
+  token->Add(TextElementBuilder("wsse", "Username", user));
+  return token;
+}
+
+XMLCompositePtr WsseUsernameTokenBuilder(const std::string &user, const std::string &password) {
+  auto token = std::make_shared<XMLCompositeBuilder>(WsseUsernameTokenBuilder(user));
+  token->Add(TextElementBuilder("wsse", "Password", {{"Type", std::string(WireNames::PASSWORD_TEXT)}}, password));
+  return token;
+}
+
+XMLBuilderPtr WsseX509v3BinarySecTokenBuilder(const std::string &id, const Tarvel::Crypto::Certificate *certificate) {
+  return TextElementBuilder("wsse", "BinarySecurityToken",
+                            {{"EncodingType", std::string(WireNames::BASE64_BINARY)},
+                             {"ValueType", std::string(WireNames::X509V3)},
+                             {"wsu:Id", id},
+                             {"xmlns:wsu", std::string(Namespaces::WSU)}},
+                            EncodeBase64(*certificate));
+}
+
+XMLBuilderPtr WsseX509v3BSTReferenceBuilder(const std::string &id) {
+  auto reference = std::make_shared<XMLCompositeBuilder>(
+      ElementBuilder("wsse", "SecurityTokenReference", {{"xmlns:wsse", std::string(Namespaces::WSSE)}}));
+  reference->Add(
+      ElementBuilder("wsse", "Reference", {{"URI", "#" + id}, {"ValueType", std::string(WireNames::X509V3)}}));
+  return reference;
+}
+
+XMLBuilderPtr WsseSamlKeyIdReferenceBuilder(const std::string &assertionId) {
+  auto reference = std::make_shared<XMLCompositeBuilder>(
+      ElementBuilder("wsse", "SecurityTokenReference",
+                     {{"wsse11:TokenType", std::string(WireNames::SAML_TOKEN_TYPE)},
+                      {"xmlns:wsse", std::string(Namespaces::WSSE)},
+                      {"xmlns:wsse11", std::string(Namespaces::WSSE11)}}));
+  reference->Add(
+      TextElementBuilder("wsse", "KeyIdentifier", {{"ValueType", std::string(WireNames::SAML_ID)}}, assertionId));
+  return reference;
+}
+
+XMLBuilderPtr InsertSamlTokenBuilder(const SamlToken &token) {
+  Tarvel::Ref<Tarvel::Xml::Document> document;
+  ParseXML(token.ToXml(), document);
+  return std::make_shared<const PreBuiltElementImpl>(
+      Tarvel::Ref<Tarvel::Xml::ElementNode>(document->GetDocumentElement()));
+}
+
+} // namespace SsoClient

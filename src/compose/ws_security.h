@@ -1,0 +1,39 @@
+// SPDX-License-Identifier: Apache-2.0
+/// @file
+/// The elements of the WS-Security header: timestamp, tokens, and references to tokens.
+
+#pragma once
+
+#include "compose/xml_builder.h"
+
+#include <ssoclient/saml_token.h>
+#include <tarvel/crypto/certificate.h>
+
+#include <string>
+
+namespace SsoClient {
+
+/// `wsse:Security` with a timestamp that begins now and ends `minutes` later; tokens are added behind the timestamp.
+XMLCompositePtr WsSecurityHeaderBuilder(int minutes);
+
+/// `wsu:Timestamp` from now, read once, to `minutes` later.
+XMLCompositePtr WssuTimestampBuilder(int minutes);
+
+/// `wsse:UsernameToken`, without and with a password, which is written in clear text: the channel must keep it secret.
+XMLCompositePtr WsseUsernameTokenBuilder(const std::string &user);
+XMLCompositePtr WsseUsernameTokenBuilder(const std::string &user, const std::string &password);
+
+/// `wsse:BinarySecurityToken` with that identifier, holding the certificate. Relies on the header for the prefix "wsse".
+XMLBuilderPtr WsseX509v3BinarySecTokenBuilder(const std::string &id, const Tarvel::Crypto::Certificate *certificate);
+
+/// `wsse:SecurityTokenReference` to the binary security token with that identifier.
+XMLBuilderPtr WsseX509v3BSTReferenceBuilder(const std::string &id);
+
+/// `wsse:SecurityTokenReference` to the SAML assertion with that identifier.
+XMLBuilderPtr WsseSamlKeyIdReferenceBuilder(const std::string &assertionId);
+
+/// The token's own assertion element, as it was issued, so that its signature stays valid. Builds into one tree only.
+/// @throws what `ParseXML` throws when the token's text does not parse.
+XMLBuilderPtr InsertSamlTokenBuilder(const SamlToken &token);
+
+} // namespace SsoClient

@@ -1,0 +1,38 @@
+// SPDX-License-Identifier: Apache-2.0
+/// @file
+/// `ResponseHandler`, the service's view of what reads its responses.
+
+#pragma once
+
+#include "exchange/spnego_response.h"
+
+#include <tarvel/io/reader.h>
+
+#include <string>
+
+namespace SsoClient {
+
+/// Reads the response of each operation. Each call reads the whole body from the reader, which the caller owns. Safe on
+/// any thread. All throw on a SOAP fault and on a malformed response.
+class ResponseHandler {
+public:
+  /// Sets `tokenXml` to the token of an issue response.
+  virtual void HandleAcquireTokenResponse(Tarvel::Reader *response, std::string &tokenXml) const = 0;
+
+  /// @return whether the service judged the token valid.
+  virtual bool HandleValidateSubjectResponse(Tarvel::Reader *response) const = 0;
+
+  /// Sets `tokenXml` to the token of a renew response.
+  virtual void HandleRenewTokenResponse(Tarvel::Reader *response, std::string &tokenXml) const = 0;
+
+  /// Fills the record for one leg of a negotiation.
+  virtual void HandleSPNegoResponse(Tarvel::Reader *response, SPNegoResponse &spnego) const = 0;
+
+protected:
+  ResponseHandler() = default;
+  ResponseHandler(const ResponseHandler &) = default;
+  ResponseHandler &operator=(const ResponseHandler &) = default;
+  ~ResponseHandler() = default;
+};
+
+} // namespace SsoClient

@@ -1,0 +1,44 @@
+// SPDX-License-Identifier: Apache-2.0
+/// @file
+/// The request bodies of an SPNEGO negotiation's legs.
+
+#pragma once
+
+#include "compose/xml_builder.h"
+
+#include <ssoclient/saml_token.h>
+#include <ssoclient/token_spec.h>
+
+#include <cstdint>
+#include <string>
+#include <vector>
+
+namespace SsoClient {
+
+/// The first leg: an issue request that ends in the leg. Each build gives it a new `Context`, "urn:uuid:" and a UUID.
+class XMLBodyBuilderInitialSPNego final : public XMLBaseBuilder {
+public:
+  XMLBodyBuilderInitialSPNego(SamlToken::ConfirmationType confirmation, const TokenSpec &spec,
+                              const std::vector<std::uint8_t> &leg);
+
+  void build(Tarvel::Ref<Tarvel::Xml::ElementNode> &out) const override;
+
+private:
+  SamlToken::ConfirmationType m_confirmation;
+  TokenSpec m_spec;
+  std::vector<std::uint8_t> m_leg;
+};
+
+/// A further leg: sent as a response element, in the `Context` that the service gave the negotiation.
+class XMLBodyBuilderContinuedSPNego final : public XMLBaseBuilder {
+public:
+  XMLBodyBuilderContinuedSPNego(const std::string &contextId, const std::vector<std::uint8_t> &leg);
+
+  void build(Tarvel::Ref<Tarvel::Xml::ElementNode> &out) const override;
+
+private:
+  std::string m_contextId;
+  std::vector<std::uint8_t> m_leg;
+};
+
+} // namespace SsoClient

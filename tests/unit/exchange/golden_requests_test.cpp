@@ -1,0 +1,40 @@
+// SPDX-License-Identifier: Apache-2.0
+// Every request on the wire, byte for byte, against tests/data/requests. A change of the wire form shows as a difference of
+// these files; SSOCLIENT_UPDATE_GOLDEN=1 writes them anew, and then fails, so that nobody does so unseen.
+#include "support/data_file.h"
+#include "support/fixed_environment.h"
+#include "support/sample_requests.h"
+#include "support/wire_layout.h"
+
+#include <gtest/gtest.h>
+
+#include <cstdlib>
+
+namespace SsoClient {
+namespace {
+
+using namespace Testing;
+
+class GoldenRequest : public testing::TestWithParam<SampleRequest> {};
+
+TEST_P(GoldenRequest, IsOnTheWireAsItsFileShowsIt) {
+  const FixedEnvironment environment;
+  Request request;
+  GetParam().build(request);
+  const std::string file = std::string("requests/") + GetParam().name + ".xml";
+  const std::string readable = ToReadable(request.body);
+  ASSERT_EQ(ToWire(readable), request.body) << "the readable form does not tell the whole message";
+  if (std::getenv("SSOCLIENT_UPDATE_GOLDEN")) {
+    std::ofstream(std::string(TEST_DATA_DIR) + "/" + file, std::ios::binary) << readable;
+    FAIL() << "wrote " << file;
+  }
+  const std::string golden = ReadDataFile(file);
+  EXPECT_EQ(readable, golden);
+  EXPECT_EQ(request.body, ToWire(golden));
+}
+
+INSTANTIATE_TEST_SUITE_P(EveryOperation, GoldenRequest, testing::ValuesIn(SampleRequests()),
+                         [](const auto &sample) { return TestName(sample.param); });
+
+} // namespace
+} // namespace SsoClient
