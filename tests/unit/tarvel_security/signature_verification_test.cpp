@@ -87,4 +87,303 @@ TEST_P(VerifyFixture, FindsTheKeyAmongAllTrustedOnes) {
 
 INSTANTIATE_TEST_SUITE_P(Verify, VerifyFixture, ::testing::ValuesIn(SIGNED_FIXTURES));
 
+const std::string EXCLUSIVE_TRANSFORM = R"(<ds:Transform Algorithm="http://www.w3.org/2001/10/xml-exc-c14n#"/>)";
+
+std::string GoodToken() {
+  return ReadFixture("tokens/rsa-sha256.xml");
+}
+
+std::string IdOf(const std::string &token) {
+  const std::size_t begin = token.find(" ID=\"") + 5;
+  return token.substr(begin, token.find('"', begin) - begin);
+}
+
+/// The message with which the good token is refused when one text of it is replaced.
+std::string RefusalOf(const std::string &text) {
+  try {
+    return VerifyText(text) ? "accepted" : "wrong";
+  } catch (const XmlSecurityException &exception) {
+    return exception.what();
+  }
+}
+
+std::string Refusal(std::string_view from, std::string_view to) {
+  return RefusalOf(Replaced(GoodToken(), from, to));
+}
+
+TEST(Verify, GivesTheUrisOfWhatIsSignedWhenTheAnswerIsTrue) {
+  const auto resolver = CreateTrustSetKeyResolver(Trusted({"sts-rsa"}));
+  std::set<std::string> uris{"before"};
+  EXPECT_TRUE(SignatureOf(*ParseDocument(GoodToken()))->Verify(*resolver, uris));
+  EXPECT_EQ((std::set<std::string>{"before", "#" + IdOf(GoodToken())}), uris);
+}
+
+TEST(Verify, LeavesTheUrisAloneWhenTheAnswerIsFalse) {
+  const auto resolver = CreateTrustSetKeyResolver(Trusted({"sts-rsa"}));
+  std::set<std::string> uris;
+  EXPECT_FALSE(SignatureOf(*ParseDocument(Replaced(GoodToken(), "alice", "malice")))->Verify(*resolver, uris));
+  EXPECT_TRUE(uris.empty());
+}
+
+TEST(Verify, AnswersTheSameEachTime) {
+  const auto signature = SignatureOf(*ParseDocument(GoodToken()));
+  const auto resolver = CreateTrustSetKeyResolver(Trusted({"sts-rsa"}));
+  std::set<std::string> uris;
+  EXPECT_TRUE(signature->Verify(*resolver, uris));
+  EXPECT_TRUE(signature->Verify(*resolver, uris));
+}
+
+TEST(Verify, AnswersFalseWhenNoTrustedKeyMadeTheSignature) {
+  EXPECT_FALSE(VerifyText(GoodToken(), {"other", "sts-rsa-2"}));
+  EXPECT_FALSE(VerifyText(ReadFixture("tokens/signed-by-other.xml")));
+}
+
+TEST(Verify, AcceptsAnotherCertificateOfATrustedKeyAndOneThatHasExpired) {
+  EXPECT_TRUE(VerifyText(GoodToken(), {"sts-rsa-reissued"}));
+  EXPECT_TRUE(VerifyText(GoodToken(), {"sts-rsa-expired"}));
+}
+
+TEST(Verify, RefusesWhenNoTrustedKeyFitsTheAlgorithm) {
+  const std::string refusal = "No trusted key can be used with the signature algorithm \"";
+  EXPECT_THROWS_MESSAGE(VerifyText(GoodToken(), {}), XmlSecurityException,
+                        refusal + std::string(Uri::RSA_SHA256) + "\"");
+  EXPECT_THROWS_MESSAGE(VerifyText(GoodToken(), {"sts-ec256"}), XmlSecurityException,
+                        refusal + std::string(Uri::RSA_SHA256) + "\"");
+  EXPECT_THROWS_MESSAGE(VerifyText(ReadFixture("tokens/ecdsa-p256-sha256.xml"), {"sts-rsa"}), XmlSecurityException,
+                        refusal + std::string(Uri::ECDSA_SHA256) + "\"");
+}
+
+TEST(Verify, RefusesAnRsaKeyOfLessThan2048Bits) {
+  EXPECT_THROWS_MESSAGE(VerifyText(ReadFixture("tokens/rsa1024.xml"), {"sts-rsa1024"}), XmlSecurityException,
+                        "No trusted key can be used with the signature algorithm \"" + std::string(Uri::RSA_SHA256) +
+                            "\"");
+}
+
+TEST(Verify, RefusesEachOtherSignatureAlgorithmByName) {
+  for (const std::string uri :
+       {"http://www.w3.org/2000/09/xmldsig#rsa-sha1", "http://www.w3.org/2000/09/xmldsig#dsa-sha1",
+        "http://www.w3.org/2000/09/xmldsig#hmac-sha1", "http://www.w3.org/2001/04/xmldsig-more#hmac-sha256",
+        "http://www.w3.org/2001/04/xmldsig-more#rsa-md5", "http://www.w3.org/2001/04/xmldsig-more#rsa-sha224",
+        "http://www.w3.org/2001/04/xmldsig-more#rsa-ripemd160", "http://www.w3.org/2001/04/xmldsig-more#ecdsa-sha1",
+        "http://www.w3.org/2007/05/xmldsig-more#rsa-pss", "http://www.w3.org/2007/05/xmldsig-more#sha1-rsa-MGF1",
+        "http://www.w3.org/2001/04/xmldsig-more#RSA-SHA256", "urn:unknown", ""}) {
+    EXPECT_EQ("The signature algorithm \"" + uri + "\" is not accepted", Refusal(Uri::RSA_SHA256, uri));
+  }
+}
+
+TEST(Verify, RefusesEachOtherDigestAlgorithmByName) {
+  for (const std::string uri :
+       {"http://www.w3.org/2000/09/xmldsig#sha1", "http://www.w3.org/2001/04/xmldsig-more#md5",
+        "http://www.w3.org/2001/04/xmldsig-more#sha224", "http://www.w3.org/2001/04/xmlenc#ripemd160", "urn:unknown"}) {
+    EXPECT_EQ("The digest algorithm \"" + uri + "\" is not accepted", Refusal(Uri::DIGEST_SHA256, uri));
+  }
+}
+
+TEST(Verify, RefusesEachOtherTransformByName) {
+  for (const std::string uri :
+       {"http://www.w3.org/TR/1999/REC-xpath-19991116", "http://www.w3.org/2002/06/xmldsig-filter2",
+        "http://www.w3.org/TR/1999/REC-xslt-19991116", "http://www.w3.org/2000/09/xmldsig#base64",
+        "http://www.w3.org/2006/12/xml-c14n11", "http://www.w3.org/2002/07/decrypt#XML", "urn:unknown"}) {
+    EXPECT_EQ("The transform algorithm \"" + uri + "\" is not accepted", Refusal(Uri::ENVELOPED_SIGNATURE, uri));
+  }
+}
+
+TEST(Verify, RefusesEachOtherCanonicalizationAlgorithmByName) {
+  for (const std::string uri : {"http://www.w3.org/2006/12/xml-c14n11", "http://www.w3.org/2000/09/xmldsig#minimal"}) {
+    EXPECT_EQ("The canonicalization algorithm \"" + uri + "\" is not accepted",
+              Refusal("http://www.w3.org/2001/10/xml-exc-c14n#", uri));
+  }
+}
+
+TEST(Verify, RefusesParametersOfAlgorithms) {
+  const std::string method = "<ds:SignatureMethod Algorithm=\"" + std::string(Uri::RSA_SHA256) + "\"";
+  EXPECT_EQ("The parameter \"ds:HMACOutputLength\" of the algorithm \"" + std::string(Uri::RSA_SHA256) +
+                "\" is not accepted",
+            Refusal(method + "/>", method + "><ds:HMACOutputLength>8</ds:HMACOutputLength></ds:SignatureMethod>"));
+  EXPECT_EQ("The parameter \"x\" of the algorithm \"http://www.w3.org/2001/10/xml-exc-c14n#\" is not accepted",
+            Refusal(EXCLUSIVE_TRANSFORM, Replaced(EXCLUSIVE_TRANSFORM, "/>", "><x xmlns=\"urn:x\"/></ds:Transform>")));
+  const std::string enveloped = "<ds:Transform Algorithm=\"" + std::string(Uri::ENVELOPED_SIGNATURE) + "\"";
+  EXPECT_EQ("The parameter \"ds:XPath\" of the algorithm \"" + std::string(Uri::ENVELOPED_SIGNATURE) +
+                "\" is not accepted",
+            Refusal(enveloped + "/>", enveloped + "><ds:XPath>1</ds:XPath></ds:Transform>"));
+}
+
+TEST(Verify, RefusesInclusiveNamespacesOfAnInclusiveCanonicalization) {
+  EXPECT_EQ(
+      "The parameter \"InclusiveNamespaces\" of the algorithm \"http://www.w3.org/TR/2001/REC-xml-c14n-20010315\" "
+      "is not accepted",
+      Refusal(EXCLUSIVE_TRANSFORM,
+              "<ds:Transform Algorithm=\"http://www.w3.org/TR/2001/REC-xml-c14n-20010315\"><InclusiveNamespaces "
+              "PrefixList=\"a\" xmlns=\"http://www.w3.org/2001/10/xml-exc-c14n#\"/></ds:Transform>"));
+}
+
+TEST(Verify, RefusesMoreThanTwoTransforms) {
+  EXPECT_EQ("A reference has 3 transforms; at most 2 are accepted",
+            Refusal(EXCLUSIVE_TRANSFORM, EXCLUSIVE_TRANSFORM + EXCLUSIVE_TRANSFORM));
+}
+
+TEST(Verify, RefusesATransformAfterACanonicalization) {
+  EXPECT_EQ("The transform \"http://www.w3.org/2001/10/xml-exc-c14n#\" is not accepted after "
+            "\"http://www.w3.org/2001/10/xml-exc-c14n#\"",
+            Refusal(Uri::ENVELOPED_SIGNATURE, "http://www.w3.org/2001/10/xml-exc-c14n#"));
+  const std::string swapped =
+      Replaced(Replaced(GoodToken(), EXCLUSIVE_TRANSFORM,
+                        "<ds:Transform Algorithm=\"" + std::string(Uri::ENVELOPED_SIGNATURE) + "\"/>"),
+               Uri::ENVELOPED_SIGNATURE, "http://www.w3.org/2001/10/xml-exc-c14n#");
+  EXPECT_EQ("The transform \"http://www.w3.org/2000/09/xmldsig#enveloped-signature\" is not accepted after "
+            "\"http://www.w3.org/2001/10/xml-exc-c14n#\"",
+            RefusalOf(swapped));
+}
+
+TEST(Verify, RefusesASignatureWithoutReferences) {
+  std::string text = GoodToken();
+  const std::size_t begin = text.find("<ds:Reference");
+  text.erase(begin, text.find("</ds:SignedInfo>") - begin);
+  EXPECT_EQ("The signature has no reference", RefusalOf(text));
+}
+
+TEST(Verify, RefusesMoreThanTenReferences) {
+  std::string text = GoodToken();
+  const std::size_t begin = text.find("<ds:Reference");
+  const std::size_t end = text.find("</ds:SignedInfo>");
+  const std::string reference = text.substr(begin, end - begin);
+  for (int count = 0; count < 10; ++count) {
+    text.insert(end, reference);
+  }
+  EXPECT_EQ("The signature has 11 references; at most 10 are accepted", RefusalOf(text));
+}
+
+TEST(Verify, RefusesObjects) {
+  EXPECT_EQ("A signature with ds:Object is not accepted", Refusal("</ds:Signature>", "<ds:Object/></ds:Signature>"));
+}
+
+TEST(Verify, RefusesManifestsAndEveryOtherTypeOfReference) {
+  EXPECT_EQ("A reference of the type \"http://www.w3.org/2000/09/xmldsig#Manifest\" is not accepted",
+            Refusal("<ds:Reference ", "<ds:Reference Type=\"http://www.w3.org/2000/09/xmldsig#Manifest\" "));
+}
+
+struct UriRefusal {
+  const char *uri;
+  const char *why;
+};
+
+TEST(Verify, RefusesEachReferenceUriThatIsNeitherEmptyNorABareName) {
+  constexpr UriRefusal REFUSALS[] = {
+      {"#", "it names nothing"},
+      {"#xpointer(/)", "it is an XPointer"},
+      {"#xpointer(id('a'))", "it is an XPointer"},
+      {"http://example.com/", "it points outside the document"},
+      {"file:///etc/passwd", "it points outside the document"},
+      {"other.xml#a", "it points outside the document"},
+      {" ", "it points outside the document"},
+      {"#nobody", "no element has that identifier"},
+  };
+  const std::string uri = "#" + IdOf(GoodToken());
+  for (const UriRefusal &refusal : REFUSALS) {
+    EXPECT_EQ(std::string("The reference URI \"") + refusal.uri + "\" is not accepted: " + refusal.why,
+              Refusal(uri, refusal.uri));
+  }
+}
+
+TEST(Verify, RefusesAnIdentifierThatTwoElementsHaveWhateverTheAttribute) {
+  const std::string id = IdOf(GoodToken());
+  const std::string refusal =
+      "The reference URI \"#" + id + "\" is not accepted: several elements have that identifier";
+  const std::string wsu =
+      "xmlns:u='http://docs.oasis-open.org/wss/2004/01/oasis-200401-wss-wssecurity-utility-1.0.xsd' u:Id";
+  for (const std::string &name : {std::string("ID"), std::string("Id"), std::string("xml:id"), wsu}) {
+    const std::string duplicate = "<x " + name + "='" + id + "'/>";
+    EXPECT_EQ(refusal, Refusal("</saml:Assertion>", duplicate + "</saml:Assertion>")) << name;
+    EXPECT_EQ(refusal, Refusal("</ds:X509Data>", "</ds:X509Data>" + duplicate)) << name;
+  }
+}
+
+TEST(Verify, TakesNoOtherAttributeForAnIdentifier) {
+  const std::string id = IdOf(GoodToken());
+  for (const std::string name : {"id", "iD", "xmlns:u='urn:u' u:Id", "xmlns:u='urn:u' u:ID", "AssertionID"}) {
+    EXPECT_EQ("accepted", Refusal("</ds:X509Data>", "</ds:X509Data><x " + name + "='" + id + "'/>")) << name;
+  }
+}
+
+TEST(Verify, FindsAnElementByEachKindOfIdentifier) {
+  for (const std::string name :
+       {"Id", "xml:id",
+        "xmlns:u=\"http://docs.oasis-open.org/wss/2004/01/oasis-200401-wss-wssecurity-utility-1.0.xsd\" u:Id"}) {
+    EXPECT_EQ("wrong", Refusal(" ID=", " " + name + "=")) << name; // found, and not what was signed
+  }
+}
+
+TEST(Verify, RefusesAnEnvelopedTransformWhoseReferenceDoesNotEnvelopTheSignature) {
+  const std::string uri = "#" + IdOf(GoodToken());
+  std::string text = Replaced(GoodToken(), uri, "#elsewhere");
+  text = Replaced(text, "<saml:Subject>", "<saml:Subject ID=\"elsewhere\">");
+  EXPECT_EQ(
+      "The reference URI \"#elsewhere\" has the enveloped-signature transform, but does not envelop the signature",
+      RefusalOf(text));
+}
+
+TEST(Verify, RefusesAnEnvelopedTransformOfTheSignatureItself) {
+  const std::string uri = "#" + IdOf(GoodToken());
+  std::string text = Replaced(GoodToken(), uri, "#signature");
+  text = Replaced(text, "<ds:Signature ", "<ds:Signature Id=\"signature\" ");
+  EXPECT_EQ(
+      "The reference URI \"#signature\" has the enveloped-signature transform, but does not envelop the signature",
+      RefusalOf(text));
+}
+
+TEST(Verify, RefusesATreeWithoutCanonicalForm) {
+  EXPECT_EQ(0u, Refusal("<saml:Subject>", "<saml:Subject><foo:bar/>").find("No canonical form: "));
+}
+
+TEST(Verify, AnswersFalseForADigestOfAnotherLength) {
+  const std::string text = GoodToken();
+  const std::size_t begin = text.find("<ds:DigestValue>") + 16;
+  const std::string digest = text.substr(begin, text.find('<', begin) - begin);
+  EXPECT_EQ("wrong", Refusal(digest, "AAAA"));
+  EXPECT_EQ("wrong", Refusal(digest, digest.substr(0, digest.size() - 4) + "AAAAAAAA"));
+}
+
+TEST(Verify, ComparesTheDigestByAllItsBytes) {
+  const std::string text = GoodToken();
+  const std::size_t end = text.find("=</ds:DigestValue>");
+  std::string changed = text;
+  changed[end - 2] = changed[end - 2] == 'A' ? 'B' : 'A';
+  EXPECT_EQ("wrong", RefusalOf(changed));
+}
+
+TEST(Verify, LeavesCommentsOutOfWhatAReferenceCovers) {
+  EXPECT_EQ("accepted", Refusal("<saml:Subject>", "<!-- not signed --><saml:Subject>"));
+  std::string text = ReadFixture("tokens/c14n-exclusive-with-comments.xml");
+  EXPECT_EQ("accepted", RefusalOf(Replaced(text, "<saml:Subject>", "<!-- not signed --><saml:Subject>")));
+}
+
+TEST(Verify, CountsCDataAsText) {
+  EXPECT_EQ("accepted", Refusal("alice@corp.example", "al<![CDATA[ice@corp]]>.example"));
+}
+
+TEST(Verify, TakesOutThisSignatureAndNoOther) {
+  const std::string text = GoodToken();
+  const std::size_t begin = text.find("<ds:Signature ");
+  const std::string signature = text.substr(begin, text.find("</ds:Signature>") + 15 - begin);
+  EXPECT_EQ("wrong", Refusal("</saml:Assertion>", signature + "</saml:Assertion>"));
+}
+
+TEST(Verify, KeepsTheTreeAliveAfterTheDocumentIsGone) {
+  Tarvel::Ref<Tarvel::Xml::Security::Signature> signature;
+  {
+    const auto document = ParseDocument(GoodToken());
+    signature = SignatureOf(*document);
+  }
+  std::set<std::string> uris;
+  EXPECT_TRUE(signature->Verify(*CreateTrustSetKeyResolver(Trusted({"sts-rsa"})), uris));
+}
+
+TEST(ParsedSignature, CanOnlyBeVerified) {
+  const auto signature = SignatureOf(*ParseDocument(GoodToken()));
+  const std::string refusal = "A signature that was taken from a document can only be verified";
+  EXPECT_THROWS_MESSAGE(signature->AddReference("", "", ""), Tarvel::InvalidStateException, refusal);
+  EXPECT_THROWS_MESSAGE(signature->SetKeyInfo({}), Tarvel::InvalidStateException, refusal);
+  EXPECT_THROWS_MESSAGE(signature->GetElement(), Tarvel::InvalidStateException, refusal);
+}
+
 } // namespace
