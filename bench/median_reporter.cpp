@@ -1,0 +1,62 @@
+// SPDX-License-Identifier: Apache-2.0
+
+#include "median_reporter.h"
+
+#include <algorithm>
+#include <stdexcept>
+
+namespace Bench {
+
+namespace {
+
+class MedianReporter final : public benchmark::ConsoleReporter {
+public:
+  MedianReporter() : ConsoleReporter(OO_Tabular) {}
+
+  void ReportRuns(const std::vector<Run> &runs) override {
+    ConsoleReporter::ReportRuns(runs);
+    for (const Run &run : runs) {
+      if (run.error_occurred) {
+        throw std::runtime_error(run.benchmark_name() + ": " + run.error_message);
+      }
+      if (run.run_type == Run::RT_Aggregate && run.aggregate_name == "median") {
+        m_medians[run.run_name.str()] = Median{run.GetAdjustedCPUTime(), run.GetAdjustedRealTime()};
+      }
+    }
+  }
+
+  const Medians &GetMedians() const { return m_medians; }
+
+private:
+  Medians m_medians;
+};
+
+} // namespace
+
+Medians RunInterleaved(const std::vector<std::string> &arguments) {
+  std::vector<std::string> all = {"bench", "--benchmark_enable_random_interleaving=true", "--benchmark_repetitions=21",
+                                  "--benchmark_min_time=0.05", "--benchmark_report_aggregates_only=true"};
+  all.insert(all.end(), arguments.begin(), arguments.end());
+  std::vector<char *> argv;
+  std::transform(all.begin(), all.end(), std::back_inserter(argv), [](std::string &text) { return text.data(); });
+  int argc = static_cast<int>(argv.size());
+  benchmark::Initialize(&argc, argv.data());
+  if (benchmark::ReportUnrecognizedArguments(argc, argv.data())) {
+    throw std::runtime_error("unknown argument");
+  }
+  MedianReporter reporter;
+  benchmark::RunSpecifiedBenchmarks(&reporter);
+  return reporter.GetMedians();
+}
+
+std::string TakeOption(std::vector<std::string> &arguments, const std::string &name) {
+  const auto option = std::find(arguments.begin(), arguments.end(), name);
+  if (option == arguments.end() || option + 1 == arguments.end()) {
+    return "";
+  }
+  std::string value = *(option + 1);
+  arguments.erase(option, option + 2);
+  return value;
+}
+
+} // namespace Bench

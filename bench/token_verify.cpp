@@ -1,0 +1,211 @@
+// SPDX-License-Identifier: Apache-2.0
+/// @file
+/// Verifying a token, beside the cryptography that no verification can do without, and beside xmlsec1.
+
+#include "median_reporter.h"
+#include "xmlsec_verifier.h"
+
+#include <ssoclient/create_saml_token.h>
+
+#include <benchmark/benchmark.h>
+#include <openssl/evp.h>
+#include <openssl/pem.h>
+#include <openssl/rsa.h>
+
+#include <array>
+#include <cstdio>
+#include <cstdlib>
+#include <exception>
+#include <fstream>
+#include <iostream>
+#include <iterator>
+#include <memory>
+#include <stdexcept>
+#include <string>
+#include <vector>
+
+namespace Bench {
+
+namespace {
+
+const std::string CERTIFICATE_FILE = TOKEN_DATA_DIR "/sts-rsa.crt";
+const std::string KEY_FILE = TOKEN_DATA_DIR "/sts-rsa.key";
+
+std::string ReadFile(const std::string &path) {
+  std::ifstream file(path, std::ios::binary);
+  if (!file) {
+    throw std::runtime_error("cannot read " + path);
+  }
+  return {std::istreambuf_iterator<char>(file), {}};
+}
+
+/// The tokens, read once. All are signed with the RSA-2048 key of `CERTIFICATE_FILE`, SHA-256 and exclusive C14N.
+struct Tokens {
+  const std::string small = ReadFile(TOKEN_DATA_DIR "/bearer-5k.xml");
+  const std::string medium = ReadFile(TOKEN_DATA_DIR "/bearer-50k.xml");
+  const std::string large = ReadFile(LARGE_TOKEN);
+};
+
+const Tokens &GetTokens() {
+  static const Tokens tokens;
+  return tokens;
+}
+
+const Tarvel::Crypto::CertificateList &GetTrusted() {
+  static const Tarvel::Crypto::CertificateList trusted = Tarvel::Crypto::LoadCertificates(CERTIFICATE_FILE);
+  return trusted;
+}
+
+void VerifyByUs(benchmark::State &state, const std::string &xml) {
+  const Tarvel::Crypto::CertificateList &trusted = GetTrusted();
+  for (auto _ : state) {
+    benchmark::DoNotOptimize(SsoClient::CreateSamlToken(xml, trusted));
+  }
+}
+
+void VerifyByXmlsec(benchmark::State &state, const std::string &xml) {
+  static const XmlsecVerifier verifier(CERTIFICATE_FILE);
+  for (auto _ : state) {
+    if (!verifier.Verify(xml)) {
+      state.SkipWithError("xmlsec1 refuses the token");
+    }
+  }
+}
+
+/// One digest over a token's bytes and one check of an RSA-2048 signature, with all that can be prepared prepared.
+class Limit {
+public:
+  Limit() {
+    FILE *const file = std::fopen(KEY_FILE.c_str(), "r");
+    EVP_PKEY *const key = file ? PEM_read_PrivateKey(file, nullptr, nullptr, nullptr) : nullptr;
+    if (!key) {
+      throw std::runtime_error("cannot read " + KEY_FILE);
+    }
+    std::fclose(file);
+    Sign(key);
+    m_verify.reset(EVP_PKEY_CTX_new_from_pkey(nullptr, key, nullptr));
+    EVP_PKEY_free(key);
+    EVP_PKEY_verify_init(m_verify.get());
+    Prepare(m_verify.get());
+  }
+
+  bool Check(const std::string &xml) {
+    std::array<unsigned char, EVP_MAX_MD_SIZE> tokenDigest{};
+    EVP_DigestInit_ex2(m_digest.get(), m_sha256.get(), nullptr);
+    EVP_DigestUpdate(m_digest.get(), xml.data(), xml.size());
+    EVP_DigestFinal_ex(m_digest.get(), tokenDigest.data(), nullptr);
+    benchmark::DoNotOptimize(tokenDigest);
+    return EVP_PKEY_verify(m_verify.get(), m_signature.data(), m_signature.size(), m_signed.data(), m_signed.size()) ==
+           1;
+  }
+
+private:
+  template <auto FREE>
+  struct Deleter {
+    template <typename T>
+    void operator()(T *handle) const {
+      FREE(handle);
+    }
+  };
+  using KeyContext = std::unique_ptr<EVP_PKEY_CTX, Deleter<EVP_PKEY_CTX_free>>;
+
+  void Prepare(EVP_PKEY_CTX *context) {
+    if (EVP_PKEY_CTX_set_rsa_padding(context, RSA_PKCS1_PADDING) <= 0 ||
+        EVP_PKEY_CTX_set_signature_md(context, m_sha256.get()) <= 0) {
+      throw std::runtime_error("cannot prepare RSA");
+    }
+  }
+
+  void Sign(EVP_PKEY *key) {
+    const KeyContext context(EVP_PKEY_CTX_new_from_pkey(nullptr, key, nullptr));
+    EVP_PKEY_sign_init(context.get());
+    Prepare(context.get());
+    std::size_t length = m_signature.size();
+    if (EVP_PKEY_sign(context.get(), m_signature.data(), &length, m_signed.data(), m_signed.size()) != 1) {
+      throw std::runtime_error("cannot sign");
+    }
+  }
+
+  const std::unique_ptr<EVP_MD, Deleter<EVP_MD_free>> m_sha256{EVP_MD_fetch(nullptr, "SHA2-256", nullptr)};
+  const std::unique_ptr<EVP_MD_CTX, Deleter<EVP_MD_CTX_free>> m_digest{EVP_MD_CTX_new()};
+  const std::array<unsigned char, 32> m_signed{};
+  std::array<unsigned char, 256> m_signature{};
+  KeyContext m_verify;
+};
+
+void CheckLimit(benchmark::State &state, const std::string &xml) {
+  Limit limit;
+  for (auto _ : state) {
+    if (!limit.Check(xml)) {
+      state.SkipWithError("the signature does not verify");
+    }
+  }
+}
+
+void RegisterBenchmarks() {
+  const Tokens &tokens = GetTokens();
+  const auto add = [](const char *name, auto function, const std::string &xml) {
+    return benchmark::RegisterBenchmark(name, function, xml)->Unit(benchmark::kMicrosecond);
+  };
+  add("Limit/5k", CheckLimit, tokens.small);
+  add("CreateSamlToken/5k", VerifyByUs, tokens.small);
+  add("xmlsec1/5k", VerifyByXmlsec, tokens.small);
+  add("CreateSamlToken/50k", VerifyByUs, tokens.medium);
+  add("CreateSamlToken/5m", VerifyByUs, tokens.large);
+  for (const int threads : {1, 2}) {
+    add("Limit/scaling", CheckLimit, tokens.small)->Threads(threads)->UseRealTime();
+    add("CreateSamlToken/scaling", VerifyByUs, tokens.small)->Threads(threads)->UseRealTime();
+  }
+}
+
+double Scaling(const Medians &medians, const std::string &name) {
+  return medians.at(name + "/scaling/real_time/threads:1").wallUs /
+         medians.at(name + "/scaling/real_time/threads:2").wallUs;
+}
+
+// One object, its members on lines of their own between the braces'. Times are microseconds of the measuring thread's CPU.
+void WriteSummary(const Medians &medians, std::ostream &out) {
+  const double ours = medians.at("CreateSamlToken/5k").cpuUs;
+  const double limit = medians.at("Limit/5k").cpuUs;
+  const Tokens &tokens = GetTokens();
+  const auto nanosecondsPerByte = [&medians](const char *name, const std::string &xml) {
+    return medians.at(name).cpuUs * 1000 / static_cast<double>(xml.size());
+  };
+  out << "{\n\"token_verify\": {\"ours_us\": " << ours << ", \"limit_us\": " << limit << ", \"ratio\": " << ours / limit
+      << ", \"peers\": {\"xmlsec1\": " << medians.at("xmlsec1/5k").cpuUs
+      << "},\n  \"two_threads\": {\"ours\": " << Scaling(medians, "CreateSamlToken")
+      << ", \"limit\": " << Scaling(medians, "Limit") << "},\n  \"by_size\": {\"5k_us\": " << ours
+      << ", \"50k_us\": " << medians.at("CreateSamlToken/50k").cpuUs
+      << ", \"5m_us\": " << medians.at("CreateSamlToken/5m").cpuUs
+      << ", \"50k_ns_per_byte\": " << nanosecondsPerByte("CreateSamlToken/50k", tokens.medium)
+      << ", \"5m_ns_per_byte\": " << nanosecondsPerByte("CreateSamlToken/5m", tokens.large) << "}}\n}\n";
+}
+
+void Main(std::vector<std::string> arguments) {
+  const std::string json = TakeOption(arguments, "--json");
+  RegisterBenchmarks();
+  const Medians medians = RunInterleaved(arguments);
+  if (json.empty()) {
+    WriteSummary(medians, std::cout);
+    return;
+  }
+  std::ofstream file(json);
+  WriteSummary(medians, file);
+  if (!file.flush()) {
+    throw std::runtime_error("cannot write " + json);
+  }
+}
+
+} // namespace
+
+} // namespace Bench
+
+int main(int argc, char **argv) {
+  try {
+    Bench::Main({argv + 1, argv + argc});
+    return EXIT_SUCCESS;
+  } catch (const std::exception &error) {
+    std::cerr << "token_verify: " << error.what() << '\n';
+    return EXIT_FAILURE;
+  }
+}

@@ -1,0 +1,29 @@
+// SPDX-License-Identifier: Apache-2.0
+/// @file
+/// The peer that token verification is measured against: the xmlsec1 library.
+
+#pragma once
+
+#include <memory>
+#include <string>
+
+namespace Bench {
+
+/// Verifies signed documents with xmlsec1 and a key that is loaded once.
+class XmlsecVerifier {
+public:
+  /// @param certificatePath a PEM certificate with the key to verify with.
+  explicit XmlsecVerifier(const std::string &certificatePath);
+  XmlsecVerifier(const XmlsecVerifier &) = delete;
+  XmlsecVerifier &operator=(const XmlsecVerifier &) = delete;
+  ~XmlsecVerifier();
+
+  /// Parses `xml`, finds the signature of its root element and checks it, all its references included.
+  bool Verify(const std::string &xml) const;
+
+private:
+  struct State;
+  std::unique_ptr<State> m_state;
+};
+
+} // namespace Bench
