@@ -8,6 +8,10 @@ target_compile_options(ssoclient_options INTERFACE
   -Wall -Wextra -Wpedantic -Wshadow -Wconversion -Wsign-conversion -Wnon-virtual-dtor -Woverloaded-virtual
   -Wcast-qual -Wformat=2 -Wimplicit-fallthrough -Wundef
   $<$<BOOL:${SSOCLIENT_WERROR}>:-Werror>)
+# g++ 12 sees overlapping copies in optimised string concatenation where there are none (GCC bug 105651).
+if(CMAKE_CXX_COMPILER_ID STREQUAL "GNU" AND CMAKE_CXX_COMPILER_VERSION VERSION_LESS 13)
+  target_compile_options(ssoclient_options INTERFACE -Wno-restrict)
+endif()
 if(NOT CMAKE_BUILD_TYPE STREQUAL "Debug" AND NOT SSOCLIENT_SANITIZERS)
   target_compile_definitions(ssoclient_options INTERFACE _FORTIFY_SOURCE=2)
 endif()
