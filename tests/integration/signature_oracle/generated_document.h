@@ -1,0 +1,30 @@
+// SPDX-License-Identifier: Apache-2.0
+/// @file
+/// Documents made up from a seed, full of what canonicalisation has rules for.
+
+#pragma once
+
+#include "random_source.h"
+
+#include <cstddef>
+#include <string>
+#include <string_view>
+#include <vector>
+
+namespace Testing {
+
+/// A well-formed document without a document type declaration: namespaces declared, declared again and undeclared, default
+/// namespaces, xml: attributes, CDATA sections, comments, processing instructions, references, carriage returns, characters
+/// of all lengths. Each element has an attribute ID: "e0" for the document element, then "e1" and so on in document order.
+struct GeneratedDocument {
+  std::string text;
+  std::size_t elements = 0;
+  std::size_t endOfRoot = 0; ///< where the end tag of the document element begins
+};
+
+GeneratedDocument GenerateDocument(RandomSource &random);
+
+/// Prefixes that the documents declare, some never declared among them, and "#default": for InclusiveNamespaces.
+std::vector<std::string> GeneratePrefixList(RandomSource &random);
+
+} // namespace Testing
