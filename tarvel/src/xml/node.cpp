@@ -169,6 +169,10 @@ const ElementNode *ElementNode::FindChildElement(std::string_view localName) con
   return nullptr;
 }
 
+ElementNode *ElementNode::FindChildElement(std::string_view localName) noexcept {
+  return const_cast<ElementNode *>(static_cast<const ElementNode *>(this)->FindChildElement(localName));
+}
+
 void ElementNode::DefineAttribute(std::string_view qualifiedName, std::string_view value) {
   const std::size_t colon = qualifiedName.find(':');
   const bool hasPrefix = colon != std::string_view::npos;

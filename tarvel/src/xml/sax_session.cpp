@@ -33,6 +33,11 @@ std::string_view ToView(const xmlChar *begin, const xmlChar *end) noexcept {
   return std::string_view(reinterpret_cast<const char *>(begin), static_cast<std::size_t>(end - begin));
 }
 
+/// The first `character` in [begin, end), or null.
+const char *FindCharacter(const char *begin, const char *end, char character) noexcept {
+  return static_cast<const char *>(std::memchr(begin, character, static_cast<std::size_t>(end - begin)));
+}
+
 /// libxml2's words for an error, in one line and at a readable length, cut between two characters.
 std::string GetDetail(const xmlError &error) {
   std::string detail = error.message ? error.message : "the document is not well-formed";
@@ -232,8 +237,8 @@ void SaxSession::ReadStartTag(std::size_t begin, std::size_t end, const xmlChar 
        next = std::find_if_not(next, stop, isSpace)) {
     const char *const equals = std::find(next, stop, '=');
     const char *const quote = std::find_if(equals, stop, [](char c) { return c == '"' || c == '\''; });
-    const char *const close = quote == stop ? stop : std::find(quote + 1, stop, *quote);
-    if (close == stop) {
+    const char *const close = quote == stop ? nullptr : FindCharacter(quote + 1, stop, *quote);
+    if (!close) {
       break;
     }
     AttributeEvent event;

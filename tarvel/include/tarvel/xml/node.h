@@ -185,6 +185,7 @@ public:
 
   /// The first child element of that local name in any namespace, or null.
   const ElementNode *FindChildElement(std::string_view localName) const noexcept;
+  ElementNode *FindChildElement(std::string_view localName) noexcept;
 
   /// Adds an attribute, or a namespace declaration, of that name as written; an attribute of the same name gets the new
   /// value and keeps its place.

@@ -1,0 +1,124 @@
+// SPDX-License-Identifier: Apache-2.0
+
+#include <tarvel/xml/node.h>
+
+#include "support/xml_tree.h"
+
+#include <gtest/gtest.h>
+
+#include <filesystem>
+#include <fstream>
+#include <sstream>
+#include <string>
+
+namespace Tarvel {
+namespace Xml {
+namespace {
+
+using ::Testing::DescribeTree;
+using ::Testing::ParseDocument;
+using ::Testing::WriteElement;
+
+std::string WriteAgain(const std::string &text) {
+  return WriteElement(*ParseDocument(text)->GetDocumentElement());
+}
+
+TEST(WriteTo, EscapesWhatTextMustNotHold) {
+  EXPECT_EQ(WriteAgain("<a>&lt;&gt;&amp;\"'&#xD;\n\t</a>"), "<a>&lt;&gt;&amp;\"'&#xD;\n\t</a>");
+}
+
+TEST(WriteTo, EscapesWhatAttributeValuesMustNotHold) {
+  EXPECT_EQ(WriteAgain("<a x='&lt;>&amp;\"&apos;&#xD;&#xA;&#x9; '/>"),
+            "<a x=\"&lt;>&amp;&quot;'&#xD;&#xA;&#x9; \"></a>");
+}
+
+TEST(WriteTo, KeepsPrefixesDeclarationsAndTheirOrderAsTheyStand) {
+  const std::string text =
+      "<p:a z=\"1\" xmlns:q=\"urn:p\" xmlns=\"\" xmlns:p=\"urn:p\" q:y=\"2\"><p:b xmlns:p=\"urn:p\"></p:b></p:a>";
+  EXPECT_EQ(WriteAgain(text), text);
+}
+
+TEST(WriteTo, WritesCommentsAndProcessingInstructions) {
+  EXPECT_EQ(WriteAgain("<a><!-- c --><?t?><?u  v ?></a>"), "<a><!-- c --><?t?><?u v ?></a>");
+}
+
+TEST(WriteTo, WritesCDataAsText) {
+  EXPECT_EQ(WriteAgain("<a><![CDATA[<b>&amp;]]></a>"), "<a>&lt;b&gt;&amp;amp;</a>");
+}
+
+TEST(WriteTo, WritesTheElementAloneAndNotItsSiblings) {
+  const auto document = ParseDocument("<a>one<b x='1'><c/>two</b>three<d/></a>");
+  EXPECT_EQ(WriteElement(*document->GetDocumentElement()->FindChildElement("b")), "<b x=\"1\"><c></c>two</b>");
+}
+
+TEST(WriteTo, WritesMoreThanItsBufferHolds) {
+  const std::string text = "<a>" + std::string(100'000, 'x') + "<b></b>" + std::string(20'000, 'y') + "</a>";
+  EXPECT_TRUE(WriteAgain(text) == text);
+}
+
+const char *const TEXTS[] = {"",
+                             "plain",
+                             " leading and trailing ",
+                             "<&>\"'",
+                             "]]>",
+                             "-->",
+                             "?>",
+                             "&amp;&#x41;",
+                             "\t\n\r\r\n\n\r",
+                             "\xC3\xA4\xC3\xB6\xC3\xBC \xE2\x82\xAC \xE4\xB8\xAD\xE6\x96\x87",
+                             "\xF0\x9F\x98\x80\xF0\x9F\x91\xA8\xE2\x80\x8D\xF0\x9F\x91\xA9",
+                             "\x7F\xC2\x80\xC2\x85\xE2\x80\xA8\xEF\xBF\xBD\xEE\x80\x80"};
+
+TEST(WriteTo, CarriesEachTextThroughAParserUnchanged) {
+  for (const char *const text : TEXTS) {
+    Ref<ElementNode> element;
+    Ref<TextNode> node;
+    CreateElementNode("", "a", element);
+    CreateTextNode(node);
+    node->SetValue(text);
+    element->DefineAttribute("x", text);
+    element->AppendChild(node.get());
+    const auto document = ParseDocument(WriteElement(*element));
+    const TextNode *const read = AsText(document->GetDocumentElement()->GetFirstChild());
+    EXPECT_EQ(read ? read->GetValue() : "", text);
+    EXPECT_EQ(document->GetDocumentElement()->GetFirstAttribute()->GetValue(), text);
+  }
+}
+
+TEST(WriteTo, CarriesEveryAsciiCharacterThroughAParserUnchanged) {
+  for (char c = 1; c < 0x7F; ++c) {
+    if (c < 0x20 && c != '\t' && c != '\n' && c != '\r') {
+      continue;
+    }
+    Ref<ElementNode> element;
+    CreateElementNode("", "a", element);
+    element->DefineAttribute("x", std::string(2, c));
+    Ref<TextNode> text;
+    CreateTextNode(text);
+    text->SetValue(std::string(2, c));
+    element->AppendChild(text.get());
+    EXPECT_EQ(DescribeTree(*ParseDocument(WriteElement(*element))->GetDocumentNode()), DescribeTree(*element));
+  }
+}
+
+TEST(WriteTo, GivesTheSameTreeBackForEachToken) {
+  std::size_t tokens = 0;
+  for (const auto &entry : std::filesystem::directory_iterator(TEST_DATA_DIR "/tokens")) {
+    if (entry.path().extension() != ".xml") {
+      continue;
+    }
+    SCOPED_TRACE(entry.path());
+    std::ifstream file(entry.path());
+    std::ostringstream content;
+    content << file.rdbuf();
+    const auto document = ParseDocument(content.str());
+    const auto again = ParseDocument(WriteElement(*document->GetDocumentElement()));
+    EXPECT_TRUE(DescribeTree(*again->GetDocumentElement()) == DescribeTree(*document->GetDocumentElement()));
+    ++tokens;
+  }
+  EXPECT_GT(tokens, 10u);
+}
+
+} // namespace
+} // namespace Xml
+} // namespace Tarvel

@@ -1,0 +1,154 @@
+// SPDX-License-Identifier: Apache-2.0
+
+#include <tarvel/xml/parser.h>
+
+#include "support/throws_message.h"
+#include "support/xml_tree.h"
+
+#include <gtest/gtest.h>
+
+#include <string>
+
+namespace Tarvel {
+namespace Xml {
+namespace {
+
+using ::Testing::ParseDocument;
+
+std::string Repeat(const std::string &text, std::size_t count) {
+  std::string repeated;
+  repeated.reserve(text.size() * count);
+  for (std::size_t i = 0; i < count; ++i) {
+    repeated += text;
+  }
+  return repeated;
+}
+
+/// ` PREFIX0="VALUE0" PREFIX1="VALUE1"` and so on.
+std::string Attributes(const std::string &prefix, std::size_t count, const std::string &value = "") {
+  std::string attributes;
+  for (std::size_t i = 0; i < count; ++i) {
+    const std::string number = std::to_string(i);
+    attributes.append(" ").append(prefix).append(number).append("=\"").append(value).append("\"");
+  }
+  return attributes;
+}
+
+TEST(ParserLimits, AcceptsADocumentOfTheGreatestLengthAndNoLonger) {
+  const std::string frame = "<a></a>";
+  const std::string longest = "<a>" + std::string(MAX_DOCUMENT_BYTES - frame.size(), 'x') + "</a>";
+  const auto document = ParseDocument(longest);
+  EXPECT_EQ(AsText(document->GetDocumentElement()->GetFirstChild())->GetValue().size(), longest.size() - frame.size());
+  EXPECT_THROWS_MESSAGE(ParseDocument(longest + "\n"), XMLParseException,
+                        "the document is longer than 16777216 bytes at line 1, column 16777217");
+}
+
+TEST(ParserLimits, AcceptsTheGreatestDepthAndNoMore) {
+  const std::string deepest = Repeat("<a>", MAX_ELEMENT_DEPTH) + Repeat("</a>", MAX_ELEMENT_DEPTH);
+  EXPECT_NO_THROW(ParseDocument(deepest));
+  EXPECT_THROWS_MESSAGE(ParseDocument(Repeat("<a>", 257) + Repeat("</a>", 257)), XMLParseException,
+                        "elements are nested deeper than 256 at line 1, column 769");
+  EXPECT_THROWS_MESSAGE(ParseDocument(Repeat("<a>", 256) + "\n<a/>" + Repeat("</a>", 256)), XMLParseException,
+                        "elements are nested deeper than 256 at line 2, column 1");
+}
+
+TEST(ParserLimits, CountsDepthAnewForSiblings) {
+  const std::string branch = Repeat("<a>", MAX_ELEMENT_DEPTH - 1) + Repeat("</a>", MAX_ELEMENT_DEPTH - 1);
+  EXPECT_NO_THROW(ParseDocument("<r>" + branch + branch + branch + "</r>"));
+}
+
+TEST(ParserLimits, RefusesAHundredThousandNestedElements) {
+  EXPECT_THROWS_MESSAGE(ParseDocument(Repeat("<a>", 100'000) + Repeat("</a>", 100'000)), XMLParseException,
+                        "elements are nested deeper than 256 at line 1, column 769");
+}
+
+TEST(ParserLimits, AcceptsTheGreatestNumberOfAttributesAndNoMore) {
+  EXPECT_NO_THROW(ParseDocument("<a" + Attributes("x", MAX_ATTRIBUTES) + "/>"));
+  EXPECT_NO_THROW(ParseDocument("<a" + Attributes("x", 128) + Attributes("xmlns:y", 128, "urn:y") + "/>"));
+  EXPECT_THROWS_MESSAGE(ParseDocument("<a>\n <b" + Attributes("x", 257) + "/></a>"), XMLParseException,
+                        "an element has more than 256 attributes at line 2, column 2");
+  EXPECT_THROWS_MESSAGE(ParseDocument("<a" + Attributes("x", 129) + Attributes("xmlns:y", 128, "urn:y") + "></a>"),
+                        XMLParseException, "an element has more than 256 attributes at line 1, column 1");
+}
+
+TEST(ParserLimits, CountsAttributesBetweenEitherQuoteAndMarkupInValues) {
+  const std::string single = Repeat(" a=' > \" = '", 300);
+  EXPECT_THROWS_MESSAGE(ParseDocument("<a" + single + "/>"), XMLParseException,
+                        "an element has more than 256 attributes at line 1, column 1");
+  EXPECT_NO_THROW(ParseDocument("<a x='" + Repeat(" a=\"\"", 300) + "'>" + Repeat("'\"", 1000) + "</a>"));
+}
+
+TEST(ParserLimits, RefusesTheShortestStartTagWithTooManyAttributes) {
+  // With names that repeat, since 257 names of one byte are not to be had; the parser itself finds that only afterwards.
+  EXPECT_THROWS_MESSAGE(ParseDocument("<a" + Repeat(" a=\"\"", 257) + "/>"), XMLParseException,
+                        "an element has more than 256 attributes at line 1, column 1");
+  EXPECT_THROWS_MESSAGE(ParseDocument("<a" + Repeat(" a=\"\"", 256) + "/>"), XMLParseException,
+                        "Attribute a redefined at line 1, column 1283");
+}
+
+TEST(ParserLimits, CountsNoAttributesInCommentsCDataInstructionsAndText) {
+  const std::string tag = "<a" + Attributes("x", 1000) + ">";
+  EXPECT_NO_THROW(ParseDocument("<a><!-- " + tag + " --></a>"));
+  EXPECT_NO_THROW(ParseDocument("<a><![CDATA[" + tag + "]]></a>"));
+  EXPECT_NO_THROW(ParseDocument("<a><?pi " + tag + "?></a>"));
+  EXPECT_NO_THROW(ParseDocument("<a>" + Attributes("x", 1000) + "</a>"));
+  EXPECT_THROWS_MESSAGE(ParseDocument("<a><!-- " + tag + " -->\n" + tag + "</a>"), XMLParseException,
+                        "an element has more than 256 attributes at line 2, column 1");
+}
+
+TEST(ParserLimits, RefusesAHundredThousandAttributes) {
+  EXPECT_THROWS_MESSAGE(ParseDocument("<a" + Attributes("x", 100'000) + "/>"), XMLParseException,
+                        "an element has more than 256 attributes at line 1, column 1");
+}
+
+TEST(ParserLimits, RefusesAHundredThousandNamespaceDeclarations) {
+  EXPECT_THROWS_MESSAGE(ParseDocument("<a" + Attributes("xmlns:x", 100'000, "urn:x") + "/>"), XMLParseException,
+                        "an element has more than 256 attributes at line 1, column 1");
+}
+
+TEST(ParserLimits, AcceptsTheGreatestNumberOfNamespacesInScopeAndNoMore) {
+  const std::string outer = "<a" + Attributes("xmlns:x", 200, "urn:x") + ">";
+  const auto nested = [&outer](std::size_t count) {
+    const std::string inner = "\n<b" + Attributes("xmlns:y", count, "urn:y") + "/>";
+    return outer + inner + inner + "</a>";
+  };
+  EXPECT_NO_THROW(ParseDocument(nested(56)));
+  EXPECT_THROWS_MESSAGE(ParseDocument(nested(57)), XMLParseException,
+                        "more than 256 namespace declarations are in scope at line 2, column 1");
+}
+
+TEST(ParserLimits, AcceptsAHundredThousandElementsThatEachDeclareANamespace) {
+  const auto document = ParseDocument("<r>" + Repeat("<p:a xmlns:p=\"urn:p\"/>", 100'000) + "</r>");
+  std::size_t count = 0;
+  for (const Node *node = document->GetDocumentElement()->GetFirstChild(); node; node = node->GetNextSibling()) {
+    count += AsElement(node)->HasQName("urn:p", "a");
+  }
+  EXPECT_EQ(count, 100'000u);
+}
+
+TEST(ParserLimits, AcceptsTextAndValuesOverTenMebibytes) {
+  const std::string text = Repeat("\xC3\xA4\r\n&amp;", 1'300'000);
+  const auto document = ParseDocument("<a>" + text + "</a>");
+  // Not EXPECT_EQ, which would print them.
+  EXPECT_TRUE(AsText(document->GetDocumentElement()->GetFirstChild())->GetValue() == Repeat("\xC3\xA4\n&", 1'300'000));
+
+  const auto withValue = ParseDocument("<a x='" + text + "'/>");
+  EXPECT_TRUE(withValue->GetDocumentElement()->GetFirstAttribute()->GetValue() == Repeat("\xC3\xA4 &", 1'300'000));
+}
+
+TEST(ParserLimits, ReadsLargeDocumentsOfSmallPartsInLinearTime) {
+  // Each of these takes well under a second when time is linear, and minutes when it is quadratic.
+  EXPECT_NO_THROW(ParseDocument("<r>" + Repeat("<a/>", 2'000'000) + "</r>"));
+  EXPECT_NO_THROW(ParseDocument("<r>" + Repeat("<a>" + std::string(2000, 'x') + "</a>", 5'000) + "</r>"));
+  EXPECT_NO_THROW(ParseDocument("<r>" + Repeat("x<!--c-->", 1'000'000) + "</r>"));
+  EXPECT_NO_THROW(ParseDocument("<r>" + Repeat("<![CDATA[x]]>", 1'000'000) + "</r>"));
+  EXPECT_NO_THROW(ParseDocument("<r>" + Repeat("<p:a q:x='1'/>", 200'000) + "</r>"));
+  EXPECT_THROW(ParseDocument("<r>" + Repeat("<a x='" + std::string(2000, 'x'), 8'000)), XMLParseException);
+  EXPECT_THROW(ParseDocument("<r>" + Repeat("<!-- <a>", 2'000'000)), XMLParseException);
+  EXPECT_THROW(ParseDocument("<r>" + Repeat("&x;", 5'000'000)), XMLParseException);
+  EXPECT_THROW(ParseDocument("<r>" + Repeat("<a", 5'000'000)), XMLParseException);
+}
+
+} // namespace
+} // namespace Xml
+} // namespace Tarvel

@@ -1,0 +1,463 @@
+// SPDX-License-Identifier: Apache-2.0
+
+#include <tarvel/xml/node.h>
+
+#include "support/throws_message.h"
+#include "support/xml_tree.h"
+
+#include <tarvel/core/exception.h>
+
+#include <gtest/gtest.h>
+
+#include <atomic>
+#include <string>
+#include <thread>
+#include <type_traits>
+#include <vector>
+
+namespace Tarvel {
+namespace Xml {
+namespace {
+
+using ::Testing::DescribeTree;
+using ::Testing::ParseDocument;
+using ::Testing::WriteElement;
+using namespace std::string_literals;
+
+static_assert(std::is_trivially_destructible_v<Attribute>);
+static_assert(!std::is_copy_constructible_v<ElementNode> && !std::is_default_constructible_v<ElementNode>);
+
+Ref<ElementNode> MakeElement(std::string_view localName, std::string_view prefix = "") {
+  Ref<ElementNode> element;
+  CreateElementNode(prefix, localName, element);
+  return element;
+}
+
+Ref<TextNode> MakeText(std::string_view value) {
+  Ref<TextNode> text;
+  CreateTextNode(text);
+  text->SetValue(value);
+  return text;
+}
+
+std::string Lookup(const ElementNode &element, std::string_view prefix) {
+  std::string_view uri;
+  return element.LookupNamespace(prefix, uri) ? "bound to '" + std::string(uri) + "'" : "unbound";
+}
+
+TEST(CreateElementNode, MakesAnElementWithoutAnything) {
+  const Ref<ElementNode> element = MakeElement("Body", "soapenv");
+  EXPECT_EQ(element->GetName(), "soapenv:Body");
+  EXPECT_EQ(element->GetPrefix(), "soapenv");
+  EXPECT_EQ(element->GetLocalName(), "Body");
+  EXPECT_EQ(element->GetKind(), NodeKind::ELEMENT);
+  EXPECT_EQ(element->GetParent(), nullptr);
+  EXPECT_EQ(element->GetFirstChild(), nullptr);
+  EXPECT_EQ(element->GetNextSibling(), nullptr);
+  EXPECT_EQ(element->GetFirstAttribute(), nullptr);
+  EXPECT_EQ(element->GetRoot(), element.get());
+  EXPECT_EQ(element->GetLine(), 0u);
+  EXPECT_EQ(element->GetColumn(), 0u);
+}
+
+TEST(CreateElementNode, LeavesThePrefixOutWhenThereIsNone) {
+  const Ref<ElementNode> element = MakeElement("a");
+  EXPECT_EQ(element->GetName(), "a");
+  EXPECT_EQ(element->GetPrefix(), "");
+  EXPECT_EQ(element->GetLocalName(), "a");
+}
+
+TEST(CreateElementNode, RefusesWhatIsNoName) {
+  Ref<ElementNode> element = MakeElement("kept");
+  for (const std::string name :
+       {"", "a:b", ":", "1a", "-a", ".a", "a b", "a<", "a\n", "\xC3\x97", "\xCC\x80", "\xFF", "a\xC3"}) {
+    EXPECT_THROWS_MESSAGE(CreateElementNode("", name, element), InvalidArgumentException,
+                          "Invalid argument : the local name '" + name + "' is not an XML name without a colon");
+    if (!name.empty()) {
+      EXPECT_THROWS_MESSAGE(CreateElementNode(name, "a", element), InvalidArgumentException,
+                            "Invalid argument : the prefix '" + name + "' is not an XML name without a colon");
+    }
+  }
+  EXPECT_EQ(element->GetName(), "kept");
+}
+
+TEST(CreateElementNode, AcceptsEveryKindOfNameCharacter) {
+  for (const char *const name :
+       {"_", "a-b.c_d1", "\xC3\x80", "a\xC2\xB7", "a\xCC\x80", "\xE4\xB8\x80", "\xF0\x90\x80\x80", "A\xE2\x80\xBF"}) {
+    EXPECT_EQ(MakeElement(name)->GetLocalName(), name);
+  }
+}
+
+TEST(CreateTextNode, MakesAnEmptyTextThatTakesValues) {
+  Ref<TextNode> text;
+  CreateTextNode(text);
+  EXPECT_EQ(text->GetValue(), "");
+  EXPECT_EQ(text->GetParent(), nullptr);
+  for (const std::string &value : {"short"s, std::string(100'000, 'x'), "<&>\r\n\t\xF0\x9F\x98\x80"s, ""s}) {
+    text->SetValue(value);
+    EXPECT_TRUE(text->GetValue() == value);
+  }
+}
+
+struct Forbidden {
+  std::string value;
+  std::string message; // behind what names the text
+};
+
+const Forbidden FORBIDDEN[] = {
+    {"ab\x01", "holds the character U+0001 at byte 3, which XML 1.0 cannot carry"},
+    {"\0"s, "holds the character U+0000 at byte 1, which XML 1.0 cannot carry"},
+    {"\x1F", "holds the character U+001F at byte 1, which XML 1.0 cannot carry"},
+    {"\xC3\xA4\xEF\xBF\xBE", "holds the character U+FFFE at byte 3, which XML 1.0 cannot carry"},
+    {"\xEF\xBF\xBF", "holds the character U+FFFF at byte 1, which XML 1.0 cannot carry"},
+    {"ab\xFF", "is not UTF-8 at byte 3"},
+    {"\xED\xA0\x80", "is not UTF-8 at byte 1"},
+    {"\xC3", "is not UTF-8 at byte 1"},
+};
+
+TEST(SetValue, RefusesWhatXmlCannotCarryAndKeepsTheValue) {
+  const Ref<TextNode> text = MakeText("kept");
+  for (const Forbidden &forbidden : FORBIDDEN) {
+    EXPECT_THROWS_MESSAGE(text->SetValue(forbidden.value), InvalidArgumentException,
+                          "Invalid argument : the text " + forbidden.message);
+  }
+  EXPECT_EQ(text->GetValue(), "kept");
+}
+
+TEST(DefineAttribute, RefusesWhatXmlCannotCarryAndKeepsTheElement) {
+  const Ref<ElementNode> element = MakeElement("a");
+  for (const Forbidden &forbidden : FORBIDDEN) {
+    EXPECT_THROWS_MESSAGE(element->DefineAttribute("p:x", forbidden.value), InvalidArgumentException,
+                          "Invalid argument : the value of the attribute 'p:x' " + forbidden.message);
+  }
+  EXPECT_EQ(element->GetFirstAttribute(), nullptr);
+}
+
+TEST(DefineAttribute, RefusesWhatIsNoQualifiedName) {
+  const Ref<ElementNode> element = MakeElement("a");
+  for (const std::string name : {"", ":", "a:", ":a", "a:b:c", "1", "a:1", "a b", "a=", "\xFF"}) {
+    EXPECT_THROWS_MESSAGE(element->DefineAttribute(name, ""), InvalidArgumentException,
+                          "Invalid argument : the attribute name '" + name + "' is not a qualified XML name");
+  }
+}
+
+TEST(DefineAttribute, KeepsTheOrderAndThePlaceOfARedefinedAttribute) {
+  const Ref<ElementNode> element = MakeElement("a");
+  element->DefineAttribute("x", "1");
+  element->DefineAttribute("p:y", "2");
+  element->DefineAttribute("xmlns:p", "urn:p");
+  element->DefineAttribute("x", "changed");
+  EXPECT_EQ(WriteElement(*element), "<a x=\"changed\" p:y=\"2\" xmlns:p=\"urn:p\"></a>");
+}
+
+TEST(DefineAttribute, CopiesNameAndValue) {
+  const Ref<ElementNode> element = MakeElement("a");
+  std::string name = "name";
+  std::string value = "value";
+  element->DefineAttribute(name, value);
+  name[0] = value[0] = 'X';
+  EXPECT_EQ(WriteElement(*element), "<a name=\"value\"></a>");
+}
+
+TEST(DefineAttribute, AddsToAParsedElement) {
+  const auto document = ParseDocument("<a x='1'/>");
+  document->GetDocumentElement()->DefineAttribute("xmlns:p", "urn:p");
+  document->GetDocumentElement()->DefineAttribute("x", "2");
+  EXPECT_EQ(WriteElement(*document->GetDocumentElement()), "<a x=\"2\" xmlns:p=\"urn:p\"></a>");
+  EXPECT_EQ(Lookup(*document->GetDocumentElement(), "p"), "bound to 'urn:p'");
+}
+
+TEST(Attribute, KnowsItsPartsAndWhetherItDeclaresANamespace) {
+  const auto document = ParseDocument("<a x='1' p:y='2' xmlns='urn:d' xmlns:p='urn:p' xmlnsx='3' p:xmlns='4'/>");
+  std::string seen;
+  for (const Attribute *attribute = document->GetDocumentElement()->GetFirstAttribute(); attribute;
+       attribute = attribute->GetNext()) {
+    seen += std::string(attribute->GetPrefix()) + "|" + std::string(attribute->GetLocalName()) +
+            (attribute->IsNamespaceDeclaration() ? " declares; " : "; ");
+  }
+  EXPECT_EQ(seen, "|x; p|y; |xmlns declares; xmlns|p declares; |xmlnsx; p|xmlns; ");
+}
+
+TEST(LookupNamespace, FindsTheInnermostDeclarationInScope) {
+  const auto document = ParseDocument("<a xmlns='urn:1' xmlns:p='urn:2'><b xmlns:p='urn:3'><c xmlns=''/></b></a>");
+  const ElementNode &a = *document->GetDocumentElement();
+  const ElementNode &b = *a.FindChildElement("b");
+  const ElementNode &c = *b.FindChildElement("c");
+  EXPECT_EQ(Lookup(a, ""), "bound to 'urn:1'");
+  EXPECT_EQ(Lookup(b, ""), "bound to 'urn:1'");
+  EXPECT_EQ(Lookup(c, ""), "bound to ''");
+  EXPECT_EQ(Lookup(a, "p"), "bound to 'urn:2'");
+  EXPECT_EQ(Lookup(c, "p"), "bound to 'urn:3'");
+  EXPECT_EQ(Lookup(c, "q"), "unbound");
+}
+
+TEST(LookupNamespace, KnowsXmlAndXmlnsAndTheEmptyDefaultAlways) {
+  const Ref<ElementNode> element = MakeElement("a");
+  EXPECT_EQ(Lookup(*element, "xml"), "bound to 'http://www.w3.org/XML/1998/namespace'");
+  EXPECT_EQ(Lookup(*element, "xmlns"), "bound to 'http://www.w3.org/2000/xmlns/'");
+  EXPECT_EQ(Lookup(*element, ""), "bound to ''");
+}
+
+TEST(LookupNamespace, LeavesTheResultAloneForAnUnboundPrefix) {
+  std::string_view uri = "untouched";
+  EXPECT_FALSE(MakeElement("a")->LookupNamespace("p", uri));
+  EXPECT_EQ(uri, "untouched");
+}
+
+TEST(LookupNamespace, TakesAnEmptyDeclarationAsUnbinding) {
+  const Ref<ElementNode> outer = MakeElement("a");
+  const Ref<ElementNode> inner = MakeElement("b");
+  outer->DefineAttribute("xmlns:p", "urn:p");
+  inner->DefineAttribute("xmlns:p", "");
+  outer->AppendChild(inner.get());
+  EXPECT_EQ(Lookup(*outer, "p"), "bound to 'urn:p'");
+  EXPECT_EQ(Lookup(*inner, "p"), "unbound");
+}
+
+TEST(LookupNamespace, LooksAfreshAfterEachChange) {
+  const Ref<ElementNode> outer = MakeElement("a");
+  const Ref<ElementNode> inner = MakeElement("b", "p");
+  EXPECT_EQ(inner->GetQName(), QName("", "b"));
+  outer->AppendChild(inner.get());
+  outer->DefineAttribute("xmlns:p", "urn:outer");
+  EXPECT_EQ(inner->GetQName(), QName("urn:outer", "b"));
+  inner->DefineAttribute("xmlns:p", "urn:inner");
+  EXPECT_EQ(inner->GetQName(), QName("urn:inner", "b"));
+}
+
+TEST(HasQName, NeedsABoundPrefixAndBothTexts) {
+  const auto document = ParseDocument("<p:a xmlns:p='urn:p'><q:b/><c/></p:a>");
+  const ElementNode &a = *document->GetDocumentElement();
+  EXPECT_TRUE(a.HasQName("urn:p", "a"));
+  EXPECT_FALSE(a.HasQName("urn:p", "b"));
+  EXPECT_FALSE(a.HasQName("urn:P", "a"));
+  EXPECT_FALSE(a.HasQName("", "a"));
+  EXPECT_FALSE(a.FindChildElement("b")->HasQName("", "b")) << "an unbound prefix has no namespace, not the empty one";
+  EXPECT_TRUE(a.FindChildElement("c")->HasQName("", "c"));
+}
+
+TEST(FindAttribute, TakesAttributesWithoutPrefixForThoseInNoNamespace) {
+  const auto document = ParseDocument("<a xmlns='urn:p' xmlns:p='urn:p' xmlns:q='urn:p' r:x='0' p:x='1' x='2'/>");
+  const ElementNode &a = *document->GetDocumentElement();
+  std::string_view value = "untouched";
+  EXPECT_TRUE(a.GetAttribute(QName("", "x"), value));
+  EXPECT_EQ(value, "2");
+  EXPECT_TRUE(a.GetAttribute(QName("urn:p", "x"), value));
+  EXPECT_EQ(value, "1");
+  EXPECT_FALSE(a.GetAttribute(QName("urn:p", "y"), value));
+  EXPECT_FALSE(a.GetAttribute(QName("urn:q", "x"), value));
+  EXPECT_EQ(value, "1");
+}
+
+TEST(FindAttribute, FindsNoNamespaceDeclarations) {
+  const auto document = ParseDocument("<a xmlns='urn:d' xmlns:p='urn:p'/>");
+  const ElementNode &a = *document->GetDocumentElement();
+  EXPECT_EQ(a.FindAttribute("", "xmlns"), nullptr);
+  EXPECT_EQ(a.FindAttribute("http://www.w3.org/2000/xmlns/", "p"), nullptr);
+}
+
+TEST(FindAttribute, FindsAttributesOfTheXmlNamespace) {
+  const auto document = ParseDocument("<a xml:id='i'/>");
+  const Attribute *const found =
+      document->GetDocumentElement()->FindAttribute("http://www.w3.org/XML/1998/namespace", "id");
+  ASSERT_NE(found, nullptr);
+  EXPECT_EQ(found->GetValue(), "i");
+}
+
+TEST(FindChildElement, FindsTheFirstOfThatNameAmongTheChildrenOnly) {
+  const auto document = ParseDocument("<a xmlns:p='urn:p'>t<c><p:b n='0'/></c><b n='1'/><p:b n='2'/><p:b n='3'/></a>");
+  ElementNode &a = *document->GetDocumentElement();
+  const auto number = [](const ElementNode *element) {
+    return element ? std::string(element->FindAttribute("", "n")->GetValue()) : "none";
+  };
+  EXPECT_EQ(number(a.FindChildElement("b")), "1");
+  EXPECT_EQ(number(a.FindChildElement(QName("", "b"))), "1");
+  EXPECT_EQ(number(a.FindChildElement(QName("urn:p", "b"))), "2");
+  EXPECT_EQ(number(a.FindChildElement(QName("urn:q", "b"))), "none");
+  EXPECT_EQ(number(a.FindChildElement("d")), "none");
+}
+
+TEST(AppendChild, AppendsElementsAndTextInOrder) {
+  const Ref<ElementNode> a = MakeElement("a");
+  a->AppendChild(MakeElement("b").get());
+  a->AppendChild(MakeText("one").get());
+  a->AppendChild(MakeElement("c").get());
+  EXPECT_EQ(WriteElement(*a), "<a><b></b>one<c></c></a>");
+  EXPECT_EQ(a->FindChildElement("c")->GetParent(), a.get());
+  EXPECT_EQ(a->FindChildElement("c")->GetRoot(), a.get());
+}
+
+TEST(AppendChild, RefusesNullDocumentsAndCycles) {
+  const auto document = ParseDocument("<a><b><c/></b></a>");
+  ElementNode &a = *document->GetDocumentElement();
+  ElementNode &c = *a.FindChildElement("b")->FindChildElement("c");
+  EXPECT_THROWS_MESSAGE(a.AppendChild(nullptr), InvalidArgumentException, "Invalid argument : the child is null");
+  EXPECT_THROWS_MESSAGE(MakeElement("x")->AppendChild(a.GetParent()), InvalidArgumentException,
+                        "Invalid argument : a document cannot be a child");
+  for (ElementNode *const child : {&a, a.FindChildElement("b"), &c}) {
+    EXPECT_THROWS_MESSAGE(c.AppendChild(child), InvalidArgumentException,
+                          "Invalid argument : an element cannot be a child of itself or of a node below it");
+  }
+}
+
+TEST(AppendChild, RefusesCyclesOfNodesMadeAlone) {
+  const Ref<ElementNode> a = MakeElement("a");
+  const Ref<ElementNode> b = MakeElement("b");
+  const Ref<ElementNode> c = MakeElement("c");
+  b->AppendChild(c.get());
+  a->AppendChild(b.get());
+  EXPECT_THROWS_MESSAGE(c->AppendChild(a.get()), InvalidArgumentException,
+                        "Invalid argument : an element cannot be a child of itself or of a node below it");
+  EXPECT_THROWS_MESSAGE(a->AppendChild(a.get()), InvalidArgumentException,
+                        "Invalid argument : an element cannot be a child of itself or of a node below it");
+}
+
+TEST(AppendChild, RefusesTheChildOfAnotherElement) {
+  const Ref<ElementNode> a = MakeElement("a");
+  const Ref<ElementNode> b = MakeElement("b");
+  a->AppendChild(b.get());
+  EXPECT_THROWS_MESSAGE(a->AppendChild(b.get()), InvalidStateException, "the node already is the child of an element");
+  EXPECT_THROWS_MESSAGE(MakeElement("c")->AppendChild(b.get()), InvalidStateException,
+                        "the node already is the child of an element");
+  EXPECT_EQ(WriteElement(*a), "<a><b></b></a>");
+}
+
+TEST(AppendChild, TakesADocumentElementOutOfItsDocument) {
+  const Ref<ElementNode> envelope = MakeElement("envelope");
+  const auto document = ParseDocument("<!--before--><a><b/></a><!--after-->");
+  envelope->AppendChild(document->GetDocumentElement());
+  EXPECT_EQ(document->GetDocumentElement(), nullptr);
+  EXPECT_EQ(DescribeTree(*document->GetDocumentNode()), " comment=6:before comment=5:after");
+  EXPECT_EQ(WriteElement(*envelope), "<envelope><a><b></b></a></envelope>");
+  EXPECT_EQ(envelope->FindChildElement("a")->GetNextSibling(), nullptr);
+}
+
+TEST(AppendChild, TakesTheLastNodeOutOfItsDocument) {
+  const auto document = ParseDocument("<a/><!--after-->");
+  ElementNode *const a = document->GetDocumentElement();
+  a->AppendChild(a->GetNextSibling());
+  EXPECT_EQ(DescribeTree(*document->GetDocumentNode()), "(1:a comment=5:after)");
+  const Ref<ElementNode> b = MakeElement("b");
+  b->AppendChild(a);
+  EXPECT_EQ(DescribeTree(*document->GetDocumentNode()), "");
+  EXPECT_EQ(DescribeTree(*b), "(1:b(1:a comment=5:after))");
+}
+
+TEST(NodeLifetime, AReferenceToAnyNodeKeepsTheWholeTree) {
+  Ref<const Node> inner;
+  {
+    const auto document = ParseDocument("<a x='1'><b>text &amp; more</b></a>");
+    inner = Ref<const Node>(document->GetDocumentElement()->FindChildElement("b")->GetFirstChild());
+  }
+  EXPECT_EQ(DescribeTree(*inner->GetRoot()), "(1:a @1:x=1:1(1:b text=11:text & more))");
+}
+
+TEST(NodeLifetime, AppendedTreesLiveTogetherFromEitherEnd) {
+  Ref<const Node> fromAbove;
+  Ref<const Node> fromBelow;
+  {
+    const Ref<ElementNode> a = MakeElement("a");
+    const auto document = ParseDocument("<b><c/></b>");
+    a->AppendChild(document->GetDocumentElement());
+    fromAbove = a;
+    fromBelow = Ref<const Node>(a->FindChildElement("b")->FindChildElement("c"));
+  }
+  const Node *const root = fromBelow->GetRoot();
+  fromAbove.reset();
+  EXPECT_EQ(DescribeTree(*root), "(1:a(1:b(1:c)))");
+}
+
+TEST(NodeLifetime, TreesAppendedCrosswiseAreFreedTogether) {
+  // Arenas that owned each other here would leak, which the leak checker of the sanitizer build reports.
+  const auto first = ParseDocument("<a><x/></a>");
+  const auto second = ParseDocument("<b><y/></b><!--c-->");
+  const Ref<ElementNode> third = MakeElement("d");
+  second->GetDocumentElement()->FindChildElement("y")->AppendChild(third.get());
+  Node *const comment = second->GetDocumentElement()->GetNextSibling();
+  first->GetDocumentElement()->FindChildElement("x")->AppendChild(second->GetDocumentElement());
+  third->AppendChild(comment);
+  EXPECT_EQ(DescribeTree(*first->GetDocumentNode()), "(1:a(1:x(1:b(1:y(1:d comment=1:c)))))");
+}
+
+TEST(NodeLifetime, ComposesAndDropsAHundredThousandDeepTreeWithoutRecursion) {
+  constexpr int DEPTH = 100'000;
+  Ref<ElementNode> top = MakeElement("a");
+  const ElementNode *const bottom = top.get();
+  for (int i = 1; i < DEPTH; ++i) {
+    const Ref<ElementNode> above = MakeElement("a");
+    above->AppendChild(top.get());
+    top = above;
+  }
+  EXPECT_EQ(bottom->GetRoot(), top.get());
+  EXPECT_EQ(Lookup(*bottom, "p"), "unbound");
+  EXPECT_EQ(WriteElement(*top).size(), std::size_t{DEPTH} * 7);
+}
+
+TEST(NodeLifetime, AppendsAHundredThousandChildrenInLinearTime) {
+  const Ref<ElementNode> top = MakeElement("a");
+  for (int i = 0; i < 100'000; ++i) {
+    top->AppendChild(MakeElement("b").get());
+  }
+  EXPECT_EQ(WriteElement(*top).size(), 100'000u * 7 + 7);
+}
+
+TEST(NodeConcurrency, ATreeIsReadAndSharedByManyThreads) {
+  const auto document = ParseDocument("<p:a xmlns:p='urn:p'><b x='1'>text</b><p:c/></p:a>");
+  document->GetDocumentElement()->AppendChild(MakeElement("d", "p").get());
+  const std::string expected = WriteElement(*document->GetDocumentElement());
+  std::atomic<int> wrong{0};
+  std::vector<std::thread> threads;
+  for (int t = 0; t < 4; ++t) {
+    threads.emplace_back([&] {
+      for (int i = 0; i < 500; ++i) {
+        const Ref<const Document> shared = document;
+        const Ref<const ElementNode> child(shared->GetDocumentElement()->FindChildElement(QName("urn:p", "d")));
+        wrong += !child || WriteElement(*AsElement(child->GetParent())) != expected;
+      }
+    });
+  }
+  for (std::thread &thread : threads) {
+    thread.join();
+  }
+  EXPECT_EQ(wrong, 0);
+}
+
+TEST(NodeConcurrency, DocumentsAreParsedOnManyThreadsAtOnce) {
+  std::atomic<int> wrong{0};
+  std::vector<std::thread> threads;
+  for (int t = 0; t < 4; ++t) {
+    threads.emplace_back([&wrong, t] {
+      for (int i = 0; i < 200; ++i) {
+        const std::string text = "<a" + std::to_string(t) + ">" + std::to_string(i) + "</a" + std::to_string(t) + ">";
+        wrong += WriteElement(*ParseDocument(text)->GetDocumentElement()) != text;
+        try {
+          ParseDocument(text + "<");
+          ++wrong;
+        } catch (const XMLParseException &) {
+          continue;
+        }
+      }
+    });
+  }
+  for (std::thread &thread : threads) {
+    thread.join();
+  }
+  EXPECT_EQ(wrong, 0);
+}
+
+TEST(CheckedDowncasts, AreNullForNullAndForOtherKinds) {
+  const auto document = ParseDocument("<a>text</a>");
+  const Node *const element = document->GetDocumentElement();
+  const Node *const text = element->GetFirstChild();
+  const Node *const none = nullptr;
+  EXPECT_EQ(AsElement(element), element);
+  EXPECT_EQ(AsElement(text), nullptr);
+  EXPECT_EQ(AsElement(none), nullptr);
+  EXPECT_EQ(AsText(text), text);
+  EXPECT_EQ(AsText(element), nullptr);
+  EXPECT_EQ(AsText(none), nullptr);
+}
+
+} // namespace
+} // namespace Xml
+} // namespace Tarvel
