@@ -1,0 +1,71 @@
+// SPDX-License-Identifier: Apache-2.0
+/// @file
+/// TLS: what to trust, whom to be, and streams over it.
+
+#pragma once
+
+#include <tarvel/core/export.h>
+#include <tarvel/core/ref.h>
+#include <tarvel/crypto/certificate.h>
+#include <tarvel/crypto/private_key.h>
+#include <tarvel/system/stream.h>
+
+#include <cstddef>
+#include <functional>
+#include <string>
+
+namespace Tarvel {
+namespace Ssl {
+
+/// A failed handshake or a broken TLS connection; the message names the host and the reason in the TLS library's words.
+class TARVEL_API SSLException : public System::NetworkException {
+  TARVEL_EXCEPTION_BODY(SSLException, System::NetworkException);
+};
+
+/// A TLS layer over a connected stream.
+class TARVEL_API SSLStream : public System::Stream {
+public:
+  using HandshakeHandler = std::function<void(const Exception *)>;
+
+  /// Shakes hands as a client. `host` is sent as the server name (unless it is an address) and the server's certificate
+  /// must be for it, and chain to what the context trusts.
+  /// @param parameter empty, or the SHA-256 thumbprint that the server's certificate must have (64 hexadecimal digits,
+  ///        colons optional); it then stands in for the checks of chain and name. Any other text fails the handshake.
+  virtual void AsyncHandshake(const std::string &host, const std::string &parameter, HandshakeHandler handler) = 0;
+
+  /// After the handshake: whether an earlier session was resumed.
+  virtual bool WasResumed() const noexcept = 0;
+
+protected:
+  ~SSLStream() override;
+};
+
+/// Settings and session memory for TLS connections: TLS 1.2 or later, peer and host name always verified. Set it up on
+/// one thread, then use it on any; not to be changed while in use.
+class TARVEL_API SSLContext : public Object {
+public:
+  /// Adds the system's trust store. @throws Crypto::CryptoException
+  virtual void TrustSystemStore() = 0;
+  /// Adds the certificates of a PEM file. @throws IOException, Crypto::CryptoException
+  virtual void TrustFile(const std::string &path) = 0;
+  virtual void TrustCertificates(const Crypto::CertificateList &certificates) = 0;
+
+  /// The certificate to show when the server asks for one, with its key and the certificates between it and the root.
+  /// @throws Crypto::KeyMismatchException, Crypto::CryptoException
+  virtual void SetClientCertificate(const Ref<const Crypto::Certificate> &certificate,
+                                    const Ref<const Crypto::PrivateKey> &key,
+                                    const Crypto::CertificateList &intermediates) = 0;
+
+  /// A TLS stream over `stream`, which is connected. `endpoint` ("host:port") is the key under which the session is
+  /// remembered for resumption.
+  virtual Ref<SSLStream> CreateStream(const Ref<System::Stream> &stream, const std::string &endpoint) = 0;
+
+protected:
+  ~SSLContext() override;
+};
+
+/// A context that trusts nothing yet.
+TARVEL_API Ref<SSLContext> CreateSSLContext();
+
+} // namespace Ssl
+} // namespace Tarvel

@@ -1,0 +1,71 @@
+// SPDX-License-Identifier: Apache-2.0
+/// @file
+/// Connected byte streams, and the TCP client socket.
+
+#pragma once
+
+#include <tarvel/core/exception.h>
+#include <tarvel/core/export.h>
+#include <tarvel/core/ref.h>
+#include <tarvel/system/scheduled_item.h>
+
+#include <cstddef>
+#include <functional>
+#include <string>
+
+namespace Tarvel {
+namespace System {
+
+/// A failure of the network: a name that does not resolve, a connection that fails or breaks, a cancelled operation.
+/// The message names the endpoint and the reason.
+class TARVEL_API NetworkException : public Exception {
+  TARVEL_EXCEPTION_BODY(NetworkException, Exception);
+};
+
+/// A time-out of an operation that was waited for.
+class TARVEL_API TimeoutException : public NetworkException {
+  TARVEL_EXCEPTION_BODY(TimeoutException, NetworkException);
+};
+
+/// A connected stream of bytes, driven asynchronously. Completions run on the platform's I/O threads, exactly once for
+/// each start, never before the starting call returns. At most one read and one write may be pending at a time. Buffers
+/// belong to the caller and must stay until the completion. Any thread may start and close.
+class TARVEL_API Stream : public Object {
+public:
+  /// Called with the number of bytes moved and null, or with what went wrong. The exception is valid during the call.
+  using TransferHandler = std::function<void(std::size_t, const Exception *)>;
+
+  /// Reads at least one byte, at most `length`; 0 bytes and no exception mean the peer's orderly end.
+  virtual void AsyncReadSome(char *buffer, std::size_t length, TransferHandler handler) = 0;
+
+  /// Writes all `length` bytes.
+  virtual void AsyncWrite(const char *bytes, std::size_t length, TransferHandler handler) = 0;
+
+  /// Ends the connection at once; pending operations complete with an exception.
+  virtual void Close() noexcept = 0;
+
+protected:
+  ~Stream() override;
+};
+
+/// A TCP connection to be made.
+class TARVEL_API TcpClientSocket : public Stream {
+public:
+  using ConnectHandler = std::function<void(const Exception *)>;
+
+  /// Resolves `host` (a name, or an IPv4 or IPv6 address, this one with or without brackets) and connects, trying each
+  /// address in the resolver's order until one answers. Names that are not ASCII are refused.
+  virtual void AsyncConnect(const std::string &host, int port, ConnectHandler handler) = 0;
+
+protected:
+  ~TcpClientSocket() override;
+};
+
+/// A socket, not connected. Its completions run on the platform's I/O threads.
+TARVEL_API Ref<TcpClientSocket> CreateTcpClientSocket();
+
+/// A handle that cancels by closing `stream`.
+TARVEL_API Ref<ScheduledItem> CreateStreamCanceller(const Ref<Stream> &stream);
+
+} // namespace System
+} // namespace Tarvel
