@@ -28,7 +28,7 @@ class TARVEL_API TimeoutException : public NetworkException {
 };
 
 /// A connected stream of bytes, driven asynchronously. Completions run on the platform's I/O threads, exactly once for
-/// each start, never before the starting call returns. At most one read and one write may be pending at a time. Buffers
+/// each start, never inside the starting call (though perhaps before it has returned). At most one read and one write may be pending at a time. Buffers
 /// belong to the caller and must stay until the completion. Any thread may start and close.
 class TARVEL_API Stream : public Object {
 public:

@@ -1,0 +1,67 @@
+// SPDX-License-Identifier: Apache-2.0
+/// @file
+/// The one implementation of `TcpClientSocket`, over Asio's socket.
+
+#pragma once
+
+#include "system/name_lookup.h"
+
+#include <tarvel/system/stream.h>
+
+#include <boost/asio/ip/tcp.hpp>
+
+#include <memory>
+#include <mutex>
+#include <string>
+#include <string_view>
+
+namespace Tarvel::System {
+
+class TcpClientSocketImpl final : public TcpClientSocket {
+public:
+  TcpClientSocketImpl();
+
+  void AsyncConnect(const std::string &host, int port, ConnectHandler handler) override;
+  void AsyncReadSome(char *buffer, std::size_t length, TransferHandler handler) override;
+  void AsyncWrite(const char *bytes, std::size_t length, TransferHandler handler) override;
+  void Close() noexcept override;
+
+  /// Whether the connect has ended, well or badly, or was never started and never will be.
+  bool IsConnectDone() const noexcept;
+
+private:
+  enum class Stage { FRESH, CONNECTING, CONNECTED, ENDED };
+
+  ~TcpClientSocketImpl() override = default;
+
+  // Of the connect. Those that begin with "Try" or "Give" are called under the lock.
+  void LookUpAndConnect(const std::string &host);
+  void TryAddresses(AddressList addresses);
+  void TryNextAddress();
+  void GiveUpConnect(const std::string &reason);
+  bool OpenSocket(const boost::asio::ip::tcp::endpoint &endpoint, boost::system::error_code &error);
+  void OnConnectAttempt(const boost::system::error_code &error);
+  void NoteFailedAttempt(const boost::system::error_code &error);
+
+  struct PendingWrite;
+  void WriteSome(std::unique_ptr<PendingWrite> pending);
+  void OnWritten(std::unique_ptr<PendingWrite> pending, const boost::system::error_code &error, std::size_t count);
+  void OnRead(const TransferHandler &handler, const boost::system::error_code &error, std::size_t count);
+
+  NetworkException DescribeTransferFailure(const boost::system::error_code &error) const;
+
+  mutable std::mutex m_mutex; // guards all that follows; never held while a handler runs
+  boost::asio::ip::tcp::socket m_socket;
+  Stage m_stage = Stage::FRESH;
+  std::string m_target; // "host:port", for messages; set once
+  int m_port = 0;
+
+  // While connecting.
+  ConnectHandler m_connectHandler;
+  Ref<ScheduledItem> m_lookup;
+  AddressList m_addresses;
+  std::size_t m_nextAddress = 0;
+  std::string m_attempts; // the reasons of the failed ones
+};
+
+} // namespace Tarvel::System

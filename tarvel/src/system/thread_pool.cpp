@@ -1,0 +1,226 @@
+// SPDX-License-Identifier: Apache-2.0
+
+#include <tarvel/system/thread_pool.h>
+
+#include "system/background_thread.h"
+#include "system/uncaught_exception.h"
+
+#include <tarvel/core/exception.h>
+
+#include <algorithm>
+#include <atomic>
+#include <condition_variable>
+#include <iterator>
+#include <list>
+#include <memory>
+#include <mutex>
+#include <thread>
+#include <utility>
+
+namespace Tarvel {
+namespace System {
+
+namespace {
+
+class WorkItem;
+using WorkQueue = std::list<Ref<WorkItem>>;
+
+/// What the pool object, its threads and its items share; it lives as long as the last of them.
+struct PoolState {
+  PoolState(std::size_t threadCeiling, std::chrono::milliseconds threadIdleTime)
+      : ceiling(threadCeiling), idleTime(threadIdleTime) {}
+
+  const std::size_t ceiling;
+  const std::chrono::milliseconds idleTime;
+
+  std::mutex mutex; // guards all that follows
+  std::condition_variable changed;
+  WorkQueue queue;
+  std::list<std::thread> threads;
+  std::list<std::thread> retired; // ended, or about to: joined by the next to retire, or with the pool
+  std::size_t idle = 0;
+  bool ended = false;
+};
+
+/// The pool whose thread this is; null on every other thread.
+thread_local const PoolState *currentPool = nullptr;
+
+class WorkItem final : public ScheduledItem {
+public:
+  WorkItem(std::shared_ptr<PoolState> pool, std::function<void()> work)
+      : m_pool(std::move(pool)), m_work(std::move(work)) {}
+
+  void Cancel() noexcept override {
+    const Ref<WorkItem> self(this); // the queue's reference may be the last
+    std::function<void()> work;     // destroyed outside the lock: it may hold anything
+    {
+      const std::lock_guard<std::mutex> lock(m_pool->mutex);
+      if (m_stage != Stage::QUEUED) {
+        return;
+      }
+      m_stage = Stage::DONE;
+      m_pool->queue.erase(m_place);
+      work.swap(m_work);
+    }
+  }
+
+  bool IsDone() const noexcept override { return m_stage == Stage::DONE; }
+
+  /// Called under the pool's lock.
+  void PutIntoQueue() { m_place = m_pool->queue.insert(m_pool->queue.end(), Ref<WorkItem>(this)); }
+  void TakeOutOfQueue() noexcept {
+    m_pool->queue.erase(m_place);
+    m_stage = Stage::RUNNING;
+  }
+
+  /// Called once, after `TakeOutOfQueue`.
+  void Run() noexcept {
+    try {
+      m_work();
+    } catch (...) {
+      LogUncaughtException("a work item of the thread pool");
+    }
+    m_work = nullptr;
+    m_stage = Stage::DONE;
+  }
+
+private:
+  enum class Stage { QUEUED, RUNNING, DONE };
+
+  const std::shared_ptr<PoolState> m_pool;
+  std::function<void()> m_work;
+  WorkQueue::iterator m_place; // while queued
+  std::atomic<Stage> m_stage{Stage::QUEUED};
+};
+
+/// The next item to run; null when the thread has been idle for long enough, or the pool has ended.
+Ref<WorkItem> WaitForWork(PoolState &pool, std::unique_lock<std::mutex> &lock) {
+  ++pool.idle;
+  pool.changed.wait_for(lock, pool.idleTime, [&pool] { return pool.ended || !pool.queue.empty(); });
+  --pool.idle;
+  if (pool.ended || pool.queue.empty()) {
+    return {};
+  }
+  const Ref<WorkItem> item = pool.queue.front();
+  item->TakeOutOfQueue();
+  return item;
+}
+
+/// Takes the calling thread off the pool's list, and joins those that retired before it.
+void Retire(PoolState &pool, std::list<std::thread>::iterator self, std::unique_lock<std::mutex> &lock) {
+  std::list<std::thread> earlier;
+  earlier.swap(pool.retired);
+  pool.retired.splice(pool.retired.end(), pool.threads, self);
+  lock.unlock();
+  for (std::thread &thread : earlier) {
+    thread.join();
+  }
+}
+
+void RunThread(const std::shared_ptr<PoolState> &pool, std::list<std::thread>::iterator self) {
+  currentPool = pool.get();
+  std::unique_lock<std::mutex> lock(pool->mutex);
+  while (Ref<WorkItem> item = WaitForWork(*pool, lock)) {
+    lock.unlock();
+    item->Run();
+    item.reset();
+    lock.lock();
+  }
+  if (!pool->ended) {
+    Retire(*pool, self, lock);
+  }
+}
+
+/// Called under the pool's lock.
+void AddThread(const std::shared_ptr<PoolState> &pool) {
+  const auto self = pool->threads.emplace(pool->threads.end());
+  try {
+    *self = StartBackgroundThread("tarvel-pool", [pool, self] { RunThread(pool, self); });
+  } catch (...) {
+    pool->threads.erase(self);
+    throw;
+  }
+}
+
+class ThreadPoolImpl final : public ThreadPool {
+public:
+  ThreadPoolImpl(std::size_t threadCeiling, std::chrono::milliseconds idleTime)
+      : m_state(std::make_shared<PoolState>(std::max<std::size_t>(threadCeiling, 1), idleTime)) {}
+
+  Ref<ScheduledItem> QueueWorkItem(std::function<void()> work) override {
+    const Ref<WorkItem> item = MakeRef<WorkItem>(m_state, std::move(work));
+    const std::lock_guard<std::mutex> lock(m_state->mutex);
+    item->PutIntoQueue();
+    if (m_state->queue.size() > m_state->idle && m_state->threads.size() < m_state->ceiling) {
+      StartThreadFor(*item);
+    }
+    m_state->changed.notify_one();
+    return item;
+  }
+
+  std::size_t GetThreadCeiling() const noexcept override { return m_state->ceiling; }
+
+  std::size_t GetThreadCount() const noexcept override {
+    const std::lock_guard<std::mutex> lock(m_state->mutex);
+    return m_state->threads.size();
+  }
+
+private:
+  ~ThreadPoolImpl() override {
+    std::list<std::thread> threads;
+    {
+      const std::lock_guard<std::mutex> lock(m_state->mutex);
+      m_state->ended = true;
+      threads.splice(threads.end(), m_state->threads);
+      threads.splice(threads.end(), m_state->retired);
+    }
+    m_state->changed.notify_all();
+    while (const Ref<WorkItem> item = GetFirstQueued()) {
+      item->Cancel();
+    }
+    for (std::thread &thread : threads) {
+      // A thread of the pool cannot wait for itself, nor for another that may be waiting for it.
+      if (currentPool == m_state.get()) {
+        thread.detach();
+      } else {
+        thread.join();
+      }
+    }
+  }
+
+  Ref<WorkItem> GetFirstQueued() const noexcept {
+    const std::lock_guard<std::mutex> lock(m_state->mutex);
+    return m_state->queue.empty() ? Ref<WorkItem>() : m_state->queue.front();
+  }
+
+  /// Without any thread the item would wait for ever; with at least one it only waits longer.
+  void StartThreadFor(WorkItem &item) {
+    try {
+      AddThread(m_state);
+    } catch (...) {
+      if (m_state->threads.empty()) {
+        item.TakeOutOfQueue();
+        throw;
+      }
+    }
+  }
+
+  const std::shared_ptr<PoolState> m_state;
+};
+
+} // namespace
+
+ThreadPool::~ThreadPool() = default;
+
+Ref<ThreadPool> GetThreadPool() {
+  // Never destroyed: its threads run past the end of static objects, and nobody waits for them.
+  static ThreadPool *const pool = CreateThreadPool(DEFAULT_THREAD_CEILING).Detach();
+  return Ref<ThreadPool>(pool);
+}
+
+Ref<ThreadPool> CreateThreadPool(std::size_t threadCeiling, std::chrono::milliseconds idleTime) {
+  return MakeRef<ThreadPoolImpl>(threadCeiling, idleTime);
+}
+
+} // namespace System
+} // namespace Tarvel
