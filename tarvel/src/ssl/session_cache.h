@@ -1,0 +1,46 @@
+// SPDX-License-Identifier: Apache-2.0
+/// @file
+/// The TLS sessions that may be resumed.
+
+#pragma once
+
+#include "ssl/ssl_handles.h"
+
+#include <cstddef>
+#include <list>
+#include <map>
+#include <mutex>
+#include <string>
+
+namespace Tarvel::Ssl {
+
+/// Recent sessions by key. The key names the endpoint and all that its certificate was checked for, since a resumed
+/// session is not checked again. Safe on any thread.
+class SessionCache {
+public:
+  SessionCache() = default;
+  SessionCache(const SessionCache &) = delete;
+  SessionCache &operator=(const SessionCache &) = delete;
+
+  /// Keeps `session`, in place of the longest unused one when there are too many.
+  void Put(const std::string &key, SessionHandle session);
+
+  /// Takes the newest usable session out: each is used once at a time, and a ticket of TLS 1.3 once at all (RFC 8446,
+  /// appendix C.4). Null when there is none.
+  SessionHandle Take(const std::string &key);
+
+  void Clear();
+
+private:
+  struct Entry {
+    std::string key;
+    SessionHandle session;
+  };
+  using Entries = std::list<Entry>;
+
+  std::mutex m_mutex;                                    // guards all that follows
+  Entries m_entries;                                     // the oldest first
+  std::multimap<std::string, Entries::iterator> m_byKey; // within a key, the oldest first
+};
+
+} // namespace Tarvel::Ssl

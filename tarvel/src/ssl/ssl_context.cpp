@@ -1,0 +1,127 @@
+// SPDX-License-Identifier: Apache-2.0
+
+#include <tarvel/ssl/ssl_context.h>
+
+#include "crypto/certificate_impl.h"
+#include "crypto/openssl_errors.h"
+#include "crypto/private_key_impl.h"
+#include "ssl/ssl_context_impl.h"
+#include "ssl/ssl_stream_impl.h"
+
+#include <filesystem>
+#include <system_error>
+
+namespace Tarvel {
+namespace Ssl {
+
+namespace {
+
+bool Exists(const char *path) {
+  std::error_code ignored; // what cannot be looked at is not there
+  return std::filesystem::exists(path, ignored);
+}
+
+void RequireSuccess(long result, const Crypto::OpenSslErrorScope &errors, const char *failure) {
+  if (result != 1) {
+    errors.Throw(failure);
+  }
+}
+
+} // namespace
+
+TARVEL_DEFINE_EXCEPTION(SSLException)
+
+SSLStream::~SSLStream() = default;
+
+SSLContext::~SSLContext() = default;
+
+SSLContextImpl::SSLContextImpl() {
+  const Crypto::OpenSslErrorScope errors;
+  m_native.reset(SSL_CTX_new(TLS_client_method()));
+  if (!m_native) {
+    errors.Throw("Cannot make an SSL context");
+  }
+  SSL_CTX *const native = m_native.get();
+  RequireSuccess(SSL_CTX_set_min_proto_version(native, TLS1_2_VERSION), errors, "Cannot require TLS 1.2");
+  SSL_CTX_set_options(native, SSL_OP_NO_RENEGOTIATION | SSL_OP_NO_COMPRESSION | SSL_OP_CLEANSE_PLAINTEXT);
+  // Only the intermediates that were given are shown, not whatever the trust store would add to them.
+  SSL_CTX_set_mode(native, SSL_MODE_AUTO_RETRY | SSL_MODE_NO_AUTO_CHAIN);
+  SSL_CTX_set_verify(native, SSL_VERIFY_PEER, nullptr);
+  SSL_CTX_set_cert_verify_callback(native, SSLStreamImpl::OnVerifyServer, nullptr);
+  // A certificate that the host trusts is trusted, also when it is not a root.
+  X509_VERIFY_PARAM_set_flags(SSL_CTX_get0_param(native), X509_V_FLAG_PARTIAL_CHAIN);
+  SSL_CTX_set_session_cache_mode(native, SSL_SESS_CACHE_CLIENT | SSL_SESS_CACHE_NO_INTERNAL);
+  SSL_CTX_sess_set_new_cb(native, SSLStreamImpl::OnNewSession);
+}
+
+// Not by OpenSSL's default paths: these can be bent by environment variables.
+void SSLContextImpl::TrustSystemStore() {
+  const Crypto::OpenSslErrorScope errors;
+  const char *const file = X509_get_default_cert_file();
+  const char *const directory = X509_get_default_cert_dir();
+  const bool hasFile = Exists(file);
+  const bool hasDirectory = Exists(directory);
+  if (!hasFile && !hasDirectory) {
+    errors.Throw(std::string("There is no system trust store at ") + file + " or " + directory);
+  }
+  m_sessions.Clear();
+  X509_STORE *const store = SSL_CTX_get_cert_store(m_native.get());
+  if (hasFile) {
+    RequireSuccess(X509_STORE_load_file(store, file), errors, "Cannot read the system trust store");
+  }
+  if (hasDirectory) {
+    RequireSuccess(X509_STORE_load_path(store, directory), errors, "Cannot read the system trust store");
+  }
+}
+
+void SSLContextImpl::TrustFile(const std::string &path) {
+  TrustCertificates(Crypto::LoadCertificates(path));
+}
+
+void SSLContextImpl::TrustCertificates(const Crypto::CertificateList &certificates) {
+  const Crypto::OpenSslErrorScope errors;
+  m_sessions.Clear();
+  X509_STORE *const store = SSL_CTX_get_cert_store(m_native.get());
+  for (const Ref<const Crypto::Certificate> &certificate : certificates) {
+    RequireSuccess(X509_STORE_add_cert(store, Crypto::AsImpl(*certificate).GetNative()), errors,
+                   "Cannot trust a certificate");
+  }
+}
+
+void SSLContextImpl::SetClientCertificate(const Ref<const Crypto::Certificate> &certificate,
+                                          const Ref<const Crypto::PrivateKey> &key,
+                                          const Crypto::CertificateList &intermediates) {
+  Crypto::RequireKeyMatchesCertificate(*key, *certificate);
+  const Crypto::OpenSslErrorScope errors;
+  m_sessions.Clear();
+  SSL_CTX *const native = m_native.get();
+  RequireSuccess(SSL_CTX_use_certificate(native, Crypto::AsImpl(*certificate).GetNative()), errors,
+                 "Cannot use the client certificate");
+  RequireSuccess(SSL_CTX_use_PrivateKey(native, Crypto::AsImpl(*key).GetNative()), errors,
+                 "Cannot use the client certificate's key");
+  SSL_CTX_clear_chain_certs(native);
+  for (const Ref<const Crypto::Certificate> &intermediate : intermediates) {
+    RequireSuccess(SSL_CTX_add1_chain_cert(native, Crypto::AsImpl(*intermediate).GetNative()), errors,
+                   "Cannot use a certificate above the client's");
+  }
+}
+
+Ref<SSLStream> SSLContextImpl::CreateStream(const Ref<System::Stream> &stream, const std::string &endpoint) {
+  return MakeRef<SSLStreamImpl>(Ref<SSLContextImpl>(this), stream, endpoint);
+}
+
+ConnectionHandle SSLContextImpl::CreateConnection() const {
+  const Crypto::OpenSslErrorScope errors;
+  ConnectionHandle connection(SSL_new(m_native.get()));
+  if (!connection) {
+    throw SSLException(errors.Describe("no TLS connection can be made"));
+  }
+  return connection;
+}
+
+Ref<SSLContext> CreateSSLContext() {
+  return MakeRef<SSLContextImpl>();
+}
+
+} // namespace Ssl
+} // namespace Tarvel

@@ -1,0 +1,39 @@
+// SPDX-License-Identifier: Apache-2.0
+/// @file
+/// The one implementation of `SSLContext`, over OpenSSL's.
+
+#pragma once
+
+#include "ssl/session_cache.h"
+#include "ssl/ssl_handles.h"
+
+#include <tarvel/ssl/ssl_context.h>
+
+namespace Tarvel::Ssl {
+
+class SSLContextImpl final : public SSLContext {
+public:
+  /// @throws Crypto::CryptoException
+  SSLContextImpl();
+
+  void TrustSystemStore() override;
+  void TrustFile(const std::string &path) override;
+  void TrustCertificates(const Crypto::CertificateList &certificates) override;
+  void SetClientCertificate(const Ref<const Crypto::Certificate> &certificate, const Ref<const Crypto::PrivateKey> &key,
+                            const Crypto::CertificateList &intermediates) override;
+  Ref<SSLStream> CreateStream(const Ref<System::Stream> &stream, const std::string &endpoint) override;
+
+  /// A connection with this context's settings.
+  /// @throws SSLException; the message is the reason.
+  ConnectionHandle CreateConnection() const;
+
+  SessionCache &GetSessions() noexcept { return m_sessions; }
+
+private:
+  ~SSLContextImpl() override = default;
+
+  ContextHandle m_native;
+  SessionCache m_sessions;
+};
+
+} // namespace Tarvel::Ssl

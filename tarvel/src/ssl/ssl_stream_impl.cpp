@@ -1,0 +1,467 @@
+// SPDX-License-Identifier: Apache-2.0
+
+#include "ssl/ssl_stream_impl.h"
+
+#include "crypto/openssl_errors.h"
+#include "system/io_engine.h"
+#include "system/uncaught_exception.h"
+
+#include <tarvel/core/exception.h>
+
+#include <boost/asio/dispatch.hpp>
+#include <boost/asio/post.hpp>
+
+#include <openssl/err.h>
+
+#include <algorithm>
+#include <utility>
+
+namespace Tarvel::Ssl {
+
+using System::LogUncaughtException;
+
+namespace {
+
+/// One record of TLS, whole (RFC 8446, section 5.2).
+constexpr std::size_t INPUT_BYTES = 5 + 16384 + 256;
+/// A record's content. More is encrypted only once the stream below has taken what there is, so that a large message is
+/// not held a second time.
+constexpr std::size_t RECORD_BYTES = 16384;
+constexpr std::size_t MAX_OUTPUT_BYTES = 4 * RECORD_BYTES;
+
+std::string DescribeSubject(X509 *certificate) {
+  const Crypto::BioHandle text(BIO_new(BIO_s_mem()));
+  if (!certificate || !text ||
+      X509_NAME_print_ex(text.get(), X509_get_subject_name(certificate), 0, XN_FLAG_RFC2253) < 0) {
+    return "unknown";
+  }
+  char *data = nullptr;
+  const long length = BIO_get_mem_data(text.get(), &data);
+  return {data, static_cast<std::size_t>(length)};
+}
+
+template <typename Handler, typename... Args>
+void CallGuarded(const Handler &handler, const Args &...args) noexcept {
+  try {
+    handler(args...);
+  } catch (...) {
+    LogUncaughtException("a completion handler");
+  }
+}
+
+void PostRefusal(System::Stream::TransferHandler handler, const char *reason) {
+  boost::asio::post(System::GetIoContext(),
+                    [handler = std::move(handler), failure = InvalidStateException(reason)] { handler(0, &failure); });
+}
+
+} // namespace
+
+/// Each handler is called once, with its result, by `Run`.
+class SSLStreamImpl::Completions {
+public:
+  void AddHandshake(HandshakeHandler handler, Failure failure) {
+    m_handshake = std::move(handler);
+    m_handshakeFailure = std::move(failure);
+  }
+  void AddRead(TransferHandler handler, std::size_t count, Failure failure) {
+    m_read = {std::move(handler), count, std::move(failure)};
+  }
+  void AddWrite(TransferHandler handler, std::size_t count, Failure failure) {
+    m_write = {std::move(handler), count, std::move(failure)};
+  }
+
+  bool IsEmpty() const noexcept { return !m_handshake && !m_read.handler && !m_write.handler; }
+
+  void Run() const noexcept {
+    if (m_handshake) {
+      CallGuarded(m_handshake, m_handshakeFailure.get());
+    }
+    for (const Transfer *transfer : {&m_write, &m_read}) {
+      if (transfer->handler) {
+        CallGuarded(transfer->handler, transfer->count, transfer->failure.get());
+      }
+    }
+  }
+
+private:
+  struct Transfer {
+    TransferHandler handler;
+    std::size_t count = 0;
+    Failure failure;
+  };
+
+  HandshakeHandler m_handshake;
+  Failure m_handshakeFailure;
+  Transfer m_read;
+  Transfer m_write;
+};
+
+SSLStreamImpl::SSLStreamImpl(const Ref<SSLContextImpl> &context, const Ref<System::Stream> &stream,
+                             const std::string &endpoint)
+    : m_context(context), m_lower(stream), m_endpoint(endpoint), m_host(endpoint) {}
+
+SSLStreamImpl::~SSLStreamImpl() {
+  const Crypto::OpenSslErrorScope errors;
+  if (m_connection && m_stage == Stage::ESTABLISHED) {
+    // Else OpenSSL takes the connection for a broken one and its session for no longer resumable.
+    SSL_set_shutdown(m_connection.get(), SSL_SENT_SHUTDOWN | SSL_RECEIVED_SHUTDOWN);
+  }
+  m_connection.reset();
+}
+
+void SSLStreamImpl::AsyncHandshake(const std::string &host, const std::string &parameter, HandshakeHandler handler) {
+  const std::lock_guard<std::mutex> lock(m_mutex);
+  if (m_stage != Stage::FRESH) {
+    auto failure =
+        m_failure ? m_failure : std::make_shared<InvalidStateException>("The TLS handshake was started before");
+    boost::asio::post(System::GetIoContext(),
+                      [handler = std::move(handler), failure = std::move(failure)] { handler(failure.get()); });
+    return;
+  }
+  m_stage = Stage::SHAKING;
+  m_host = host;
+  m_parameter = parameter;
+  m_handshake = std::move(handler);
+  PostPump();
+}
+
+void SSLStreamImpl::AsyncReadSome(char *buffer, std::size_t length, TransferHandler handler) {
+  const std::lock_guard<std::mutex> lock(m_mutex);
+  if (m_read || length == 0) {
+    PostRefusal(std::move(handler), "Another read is pending, or the read is one of no bytes");
+    return;
+  }
+  m_read = PendingRead{buffer, length, std::move(handler)};
+  PostPump();
+}
+
+void SSLStreamImpl::AsyncWrite(const char *bytes, std::size_t length, TransferHandler handler) {
+  const std::lock_guard<std::mutex> lock(m_mutex);
+  if (m_write) {
+    PostRefusal(std::move(handler), "Another write is pending");
+    return;
+  }
+  m_write = PendingWrite{bytes, length, 0, std::move(handler)};
+  PostPump();
+}
+
+void SSLStreamImpl::Close() noexcept {
+  try {
+    auto done = std::make_shared<Completions>();
+    {
+      const std::lock_guard<std::mutex> lock(m_mutex);
+      if (m_stage == Stage::ESTABLISHED && !m_lowerWrites) {
+        const Crypto::OpenSslErrorScope errors;
+        SSL_shutdown(m_connection.get()); // the notice leaves only if the stream below takes it at once
+        StartLowerWrite();
+      }
+      if (m_stage != Stage::FAILED) {
+        Fail("closed by this side", *done);
+      }
+    }
+    if (!done->IsEmpty()) {
+      boost::asio::post(System::GetIoContext(), [done] { done->Run(); });
+    }
+  } catch (...) {
+    LogUncaughtException("the end of a TLS connection");
+  }
+  m_lower->Close();
+}
+
+// Always on an I/O thread: OpenSSL reports through the thread's error queue, and there it holds nothing of the host's.
+void SSLStreamImpl::PostPump() {
+  boost::asio::post(System::GetIoContext(), [self = Ref(this)] { self->PumpOnce(); });
+}
+
+void SSLStreamImpl::PumpOnce() {
+  Completions done;
+  {
+    const std::lock_guard<std::mutex> lock(m_mutex);
+    Pump(done);
+  }
+  done.Run();
+}
+
+void SSLStreamImpl::Pump(Completions &done) {
+  ERR_clear_error();
+  if (m_stage == Stage::FRESH) {
+    FailPending(std::make_shared<InvalidStateException>("The TLS handshake has not been started"), done);
+    return;
+  }
+  bool waits = false;
+  if (m_stage == Stage::SHAKING) {
+    waits = StepHandshake(done);
+  }
+  if (m_stage == Stage::ESTABLISHED && m_write) {
+    StepWrite(done);
+  }
+  if (m_stage == Stage::ESTABLISHED && m_read) {
+    waits = StepRead(done);
+  }
+  if (m_stage == Stage::FAILED) {
+    FailPending(m_failure, done);
+  }
+  StartLowerWrite();
+  if (waits) {
+    StartLowerRead();
+  }
+}
+
+bool SSLStreamImpl::StepHandshake(Completions &done) {
+  if (!m_connection) {
+    BeginHandshake(done);
+    if (m_stage == Stage::FAILED) {
+      return false;
+    }
+  }
+  const Crypto::OpenSslErrorScope errors;
+  const int result = SSL_do_handshake(m_connection.get());
+  if (result == 1) {
+    FinishHandshake(done);
+    return false;
+  }
+  return WaitsForBytes(result, errors, done);
+}
+
+void SSLStreamImpl::BeginHandshake(Completions &done) {
+  const Crypto::OpenSslErrorScope errors;
+  try {
+    m_identity.emplace(m_host, m_parameter);
+    ConnectionHandle connection = m_context->CreateConnection();
+    Crypto::BioHandle received(BIO_new(BIO_s_mem()));
+    Crypto::BioHandle toSend(BIO_new(BIO_s_mem()));
+    if (!received || !toSend) {
+      throw SSLException(errors.Describe("no memory for the connection"));
+    }
+    m_received = received.get();
+    m_toSend = toSend.get();
+    SSL_set_bio(connection.get(), received.release(), toSend.release());
+    SSL_set_connect_state(connection.get());
+    SSL_set_app_data(connection.get(), this);
+    m_identity->Apply(connection.get());
+    m_sessionKey = m_endpoint + '\n' + m_identity->ToKey();
+    if (const SessionHandle session = m_context->GetSessions().Take(m_sessionKey)) {
+      SSL_set_session(connection.get(), session.get()); // if it does not fit, the handshake is a full one
+    }
+    m_lowerInput.resize(INPUT_BYTES);
+    m_connection = std::move(connection);
+  } catch (const Exception &exception) {
+    Fail(exception.what(), done);
+  }
+}
+
+void SSLStreamImpl::FinishHandshake(Completions &done) {
+  m_wasResumed = SSL_session_reused(m_connection.get()) == 1;
+  if (const std::string refusal = RefuseServer(); !refusal.empty()) {
+    Fail(refusal, done);
+    return;
+  }
+  m_stage = Stage::ESTABLISHED;
+  // Up to TLS 1.2 a session can be resumed again and again, and the server need not give a new one.
+  if (m_wasResumed && !m_hasNewSession && SSL_version(m_connection.get()) == TLS1_2_VERSION) {
+    KeepSession(SessionHandle(SSL_get1_session(m_connection.get())));
+  }
+  done.AddHandshake(std::exchange(m_handshake, nullptr), nullptr);
+}
+
+// What was verified in the handshake is looked at again here, because a resumed handshake verifies nothing.
+std::string SSLStreamImpl::RefuseServer() const {
+  const Crypto::CertificateHandle certificate(SSL_get1_peer_certificate(m_connection.get()));
+  if (m_identity->HasThumbprint()) {
+    return m_identity->RefuseByThumbprint(certificate.get());
+  }
+  const long verdict = SSL_get_verify_result(m_connection.get());
+  if (!certificate || verdict != X509_V_OK) {
+    return std::string("the server's certificate was not accepted: ") + X509_verify_cert_error_string(verdict);
+  }
+  return {};
+}
+
+int SSLStreamImpl::OnVerifyServer(X509_STORE_CTX *verification, void *) noexcept {
+  try {
+    const auto *const connection =
+        static_cast<SSL *>(X509_STORE_CTX_get_ex_data(verification, SSL_get_ex_data_X509_STORE_CTX_idx()));
+    auto *const stream = static_cast<SSLStreamImpl *>(SSL_get_app_data(connection));
+    stream->m_verifyFailure = stream->VerifyServer(verification);
+    return stream->m_verifyFailure.empty() ? 1 : 0;
+  } catch (...) {
+    X509_STORE_CTX_set_error(verification, X509_V_ERR_OUT_OF_MEM);
+    return 0;
+  }
+}
+
+/// Why the server's certificate is not accepted; empty when it is.
+std::string SSLStreamImpl::VerifyServer(X509_STORE_CTX *verification) const {
+  if (m_identity->HasThumbprint()) {
+    const std::string refusal = m_identity->RefuseByThumbprint(X509_STORE_CTX_get0_cert(verification));
+    X509_STORE_CTX_set_error(verification, refusal.empty() ? X509_V_OK : X509_V_ERR_APPLICATION_VERIFICATION);
+    return refusal;
+  }
+  if (X509_verify_cert(verification) == 1) {
+    return {};
+  }
+  return std::string("the server's certificate was not accepted: ") +
+         X509_verify_cert_error_string(X509_STORE_CTX_get_error(verification)) + " (certificate \"" +
+         DescribeSubject(X509_STORE_CTX_get_current_cert(verification)) + "\")";
+}
+
+int SSLStreamImpl::OnNewSession(SSL *connection, SSL_SESSION *session) noexcept {
+  auto *const stream = static_cast<SSLStreamImpl *>(SSL_get_app_data(connection));
+  try {
+    stream->KeepSession(SessionHandle(session));
+  } catch (...) {
+    LogUncaughtException("the keeping of a TLS session"); // freed by its handle
+  }
+  return 1;
+}
+
+void SSLStreamImpl::KeepSession(SessionHandle session) {
+  m_hasNewSession = true;
+  m_context->GetSessions().Put(m_sessionKey, std::move(session));
+}
+
+void SSLStreamImpl::StepWrite(Completions &done) {
+  const Crypto::OpenSslErrorScope errors;
+  while (m_write->encrypted < m_write->length && BIO_ctrl_pending(m_toSend) < MAX_OUTPUT_BYTES) {
+    std::size_t count = 0;
+    const int result = SSL_write_ex(m_connection.get(), m_write->bytes + m_write->encrypted,
+                                    std::min(m_write->length - m_write->encrypted, RECORD_BYTES), &count);
+    if (result != 1) {
+      // Memory takes every byte, so OpenSSL has no reason to wait.
+      Fail(errors.Describe("the bytes cannot be encrypted"), done);
+      return;
+    }
+    m_write->encrypted += count;
+  }
+  if (m_write->encrypted == m_write->length && BIO_ctrl_pending(m_toSend) == 0 && !m_lowerWrites) {
+    done.AddWrite(std::move(m_write->handler), m_write->length, nullptr);
+    m_write.reset();
+  }
+}
+
+bool SSLStreamImpl::StepRead(Completions &done) {
+  const Crypto::OpenSslErrorScope errors;
+  std::size_t count = 0;
+  const int result = SSL_read_ex(m_connection.get(), m_read->buffer, m_read->length, &count);
+  if (result != 1 && SSL_get_error(m_connection.get(), result) != SSL_ERROR_ZERO_RETURN) {
+    return WaitsForBytes(result, errors, done);
+  }
+  done.AddRead(std::move(m_read->handler), count, nullptr);
+  m_read.reset();
+  return false;
+}
+
+bool SSLStreamImpl::WaitsForBytes(int result, const Crypto::OpenSslErrorScope &errors, Completions &done) {
+  if (SSL_get_error(m_connection.get(), result) == SSL_ERROR_WANT_READ) {
+    if (!m_lowerEnded) {
+      return true;
+    }
+    // Without this, whoever can cut the connection could shorten a message unnoticed (RFC 8446, section 6.1).
+    Fail("the server ended the connection without TLS's closing notice", done);
+    return false;
+  }
+  Fail(m_verifyFailure.empty() ? errors.TakeText() : m_verifyFailure, done);
+  return false;
+}
+
+void SSLStreamImpl::StartLowerRead() {
+  if (m_lowerReads || m_stage == Stage::FAILED) {
+    return;
+  }
+  m_lowerReads = true;
+  m_lower->AsyncReadSome(
+      m_lowerInput.data(), m_lowerInput.size(), [self = Ref(this)](std::size_t count, const Exception *exception) {
+        auto proceed = [self, count, failure = exception ? LowerFailure(exception->what()) : LowerFailure()] {
+          Completions done;
+          {
+            const std::lock_guard<std::mutex> lock(self->m_mutex);
+            self->OnLowerRead(count, failure, done);
+          }
+          done.Run();
+        };
+        boost::asio::dispatch(System::GetIoContext(), std::move(proceed));
+      });
+}
+
+void SSLStreamImpl::OnLowerRead(std::size_t count, const LowerFailure &failure, Completions &done) {
+  m_lowerReads = false;
+  if (m_stage == Stage::FAILED) {
+    return;
+  }
+  if (failure) {
+    Fail(*failure, done);
+    return;
+  }
+  m_lowerEnded = count == 0;
+  if (count > 0 && BIO_write(m_received, m_lowerInput.data(), static_cast<int>(count)) != static_cast<int>(count)) {
+    Fail("no memory for what the server sends", done);
+    return;
+  }
+  Pump(done);
+}
+
+void SSLStreamImpl::StartLowerWrite() {
+  if (m_lowerWrites || !m_connection) {
+    return;
+  }
+  const std::size_t pending = std::min(BIO_ctrl_pending(m_toSend), 2 * MAX_OUTPUT_BYTES);
+  if (pending == 0) {
+    return;
+  }
+  m_lowerOutput.resize(pending);
+  const int count = BIO_read(m_toSend, m_lowerOutput.data(), static_cast<int>(pending));
+  m_lowerWrites = true;
+  m_lower->AsyncWrite(m_lowerOutput.data(), static_cast<std::size_t>(count),
+                      [self = Ref(this)](std::size_t, const Exception *exception) {
+                        auto proceed = [self, failure = exception ? LowerFailure(exception->what()) : LowerFailure()] {
+                          Completions done;
+                          {
+                            const std::lock_guard<std::mutex> lock(self->m_mutex);
+                            self->OnLowerWritten(failure, done);
+                          }
+                          done.Run();
+                        };
+                        boost::asio::dispatch(System::GetIoContext(), std::move(proceed));
+                      });
+}
+
+void SSLStreamImpl::OnLowerWritten(const LowerFailure &failure, Completions &done) {
+  m_lowerWrites = false;
+  if (m_stage == Stage::FAILED) {
+    return;
+  }
+  if (failure) {
+    Fail(*failure, done);
+    return;
+  }
+  Pump(done);
+}
+
+void SSLStreamImpl::Fail(const std::string &reason, Completions &done) {
+  const bool isEstablished = m_stage == Stage::ESTABLISHED;
+  if (isEstablished) {
+    // Else OpenSSL takes the session for no longer resumable; what spoils a session, OpenSSL has noted by itself.
+    SSL_set_shutdown(m_connection.get(), SSL_SENT_SHUTDOWN | SSL_RECEIVED_SHUTDOWN);
+  }
+  m_failure = std::make_shared<SSLException>((isEstablished ? "The TLS connection to " : "The TLS handshake with ") +
+                                             m_host + (isEstablished ? " broke: " : " failed: ") +
+                                             (reason.empty() ? "for no reason that OpenSSL tells" : reason));
+  m_stage = Stage::FAILED;
+  FailPending(m_failure, done);
+}
+
+void SSLStreamImpl::FailPending(const Failure &failure, Completions &done) {
+  if (m_handshake) {
+    done.AddHandshake(std::exchange(m_handshake, nullptr), failure);
+  }
+  if (m_read) {
+    done.AddRead(std::move(m_read->handler), 0, failure);
+    m_read.reset();
+  }
+  if (m_write) {
+    done.AddWrite(std::move(m_write->handler), 0, failure);
+    m_write.reset();
+  }
+}
+
+} // namespace Tarvel::Ssl

@@ -1,0 +1,124 @@
+// SPDX-License-Identifier: Apache-2.0
+/// @file
+/// The one implementation of `SSLStream`: OpenSSL's protocol between two buffers in memory, and what moves the bytes
+/// between these and the stream below.
+
+#pragma once
+
+#include "crypto/openssl_errors.h"
+#include "ssl/server_identity.h"
+#include "ssl/ssl_context_impl.h"
+#include "ssl/ssl_handles.h"
+
+#include <tarvel/ssl/ssl_context.h>
+
+#include <atomic>
+#include <memory>
+#include <mutex>
+#include <optional>
+#include <string>
+#include <vector>
+
+namespace Tarvel::Ssl {
+
+class SSLStreamImpl final : public SSLStream {
+public:
+  SSLStreamImpl(const Ref<SSLContextImpl> &context, const Ref<System::Stream> &stream, const std::string &endpoint);
+
+  void AsyncHandshake(const std::string &host, const std::string &parameter, HandshakeHandler handler) override;
+  bool WasResumed() const noexcept override { return m_wasResumed; }
+  void AsyncReadSome(char *buffer, std::size_t length, TransferHandler handler) override;
+  void AsyncWrite(const char *bytes, std::size_t length, TransferHandler handler) override;
+  void Close() noexcept override;
+
+  /// For OpenSSL: asks whether the server's certificate is good (1) or not (0).
+  static int OnVerifyServer(X509_STORE_CTX *verification, void *) noexcept;
+  /// For OpenSSL: offers a session for keeping; 1 when its reference was taken over.
+  static int OnNewSession(SSL *connection, SSL_SESSION *session) noexcept;
+
+private:
+  using Failure = std::shared_ptr<const Exception>;
+
+  enum class Stage {
+    FRESH,
+    SHAKING,
+    ESTABLISHED,
+    FAILED ///< or closed: m_failure says why
+  };
+
+  struct PendingRead {
+    char *buffer;
+    std::size_t length;
+    TransferHandler handler;
+  };
+  struct PendingWrite {
+    const char *bytes;
+    std::size_t length;
+    std::size_t encrypted;
+    TransferHandler handler;
+  };
+
+  /// Handlers whose operations have ended, to be called once the lock is released.
+  class Completions;
+
+  ~SSLStreamImpl() override;
+
+  /// What went wrong below; none when nothing did.
+  using LowerFailure = std::optional<std::string>;
+
+  void PostPump();
+  void PumpOnce();
+
+  // All that follows is called under the lock. The steps say whether they wait for bytes from below.
+  void Pump(Completions &done);
+  bool StepHandshake(Completions &done);
+  void StepWrite(Completions &done);
+  bool StepRead(Completions &done);
+  void StartLowerRead();
+  void StartLowerWrite();
+  void OnLowerRead(std::size_t count, const LowerFailure &failure, Completions &done);
+  void OnLowerWritten(const LowerFailure &failure, Completions &done);
+
+  void BeginHandshake(Completions &done);
+  void FinishHandshake(Completions &done);
+  std::string RefuseServer() const;
+  std::string VerifyServer(X509_STORE_CTX *verification) const;
+  void KeepSession(SessionHandle session);
+
+  /// Whether OpenSSL, whose call gave `result`, waits for bytes. If not, the stream has failed.
+  bool WaitsForBytes(int result, const Crypto::OpenSslErrorScope &errors, Completions &done);
+  /// Ends the stream for good: what is pending, and what comes, fails.
+  void Fail(const std::string &reason, Completions &done);
+  void FailPending(const Failure &failure, Completions &done);
+
+  const Ref<SSLContextImpl> m_context;
+  const Ref<System::Stream> m_lower;
+  const std::string m_endpoint;
+  std::atomic<bool> m_wasResumed{false};
+
+  std::mutex m_mutex; // guards all that follows; never held while a handler runs
+  Stage m_stage = Stage::FRESH;
+  Failure m_failure;
+  std::string m_host; // as given; the endpoint until then
+  std::string m_parameter;
+  std::optional<ServerIdentity> m_identity;
+  std::string m_sessionKey;
+  bool m_hasNewSession = false;
+  std::string m_verifyFailure;
+
+  ConnectionHandle m_connection; // used on the I/O threads alone, but for its end
+  BIO *m_received = nullptr;     // owned by m_connection: from below, still encrypted
+  BIO *m_toSend = nullptr;       // owned by m_connection: for below, encrypted
+
+  HandshakeHandler m_handshake;
+  std::optional<PendingRead> m_read;
+  std::optional<PendingWrite> m_write;
+
+  bool m_lowerReads = false;
+  bool m_lowerWrites = false;
+  bool m_lowerEnded = false;
+  std::vector<char> m_lowerInput;
+  std::vector<char> m_lowerOutput;
+};
+
+} // namespace Tarvel::Ssl
