@@ -10,8 +10,6 @@ C14N=http://www.w3.org/TR/2001/REC-xml-c14n-20010315
 EXCLUSIVE=http://www.w3.org/2001/10/xml-exc-c14n#
 MORE=http://www.w3.org/2001/04/xmldsig-more#
 SHA256=http://www.w3.org/2001/04/xmlenc#sha256
-SHA384=${MORE}sha384
-SHA512=http://www.w3.org/2001/04/xmlenc#sha512
 ASSERTION=urn:oasis:names:tc:SAML:2.0:assertion:Assertion
 
 # certificate NAME KEY SUBJECT [FROM TO]: a self-signed certificate for the key in KEY.key. `openssl req` takes no dates
