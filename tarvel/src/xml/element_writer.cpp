@@ -2,6 +2,8 @@
 
 #include <tarvel/xml/node.h>
 
+#include <tarvel/core/secure_wipe.h>
+
 #include <string>
 
 namespace Tarvel {
@@ -11,16 +13,24 @@ namespace {
 
 constexpr std::size_t FLUSH_BYTES = 8 * 1024;
 
-/// Gathers the pieces of markup, so that the writer is called for larger ones.
+/// Gathers the pieces of markup, so that the writer is called for larger ones. The buffer never grows, so that no copy of
+/// a text that may be secret is left behind in the heap.
 class MarkupOutput {
 public:
-  explicit MarkupOutput(Writer &writer) : m_writer(writer) {}
+  explicit MarkupOutput(Writer &writer) : m_writer(writer) { m_buffer.reserve(FLUSH_BYTES); }
+  MarkupOutput(const MarkupOutput &) = delete;
+  MarkupOutput &operator=(const MarkupOutput &) = delete;
+  ~MarkupOutput() { SecureWipe(m_buffer); }
 
   MarkupOutput &operator<<(std::string_view markup) {
-    m_buffer.append(markup);
-    if (m_buffer.size() >= FLUSH_BYTES) {
+    if (markup.size() > FLUSH_BYTES - m_buffer.size()) {
       Flush();
     }
+    if (markup.size() > FLUSH_BYTES) {
+      m_writer.Write(markup);
+      return *this;
+    }
+    m_buffer.append(markup);
     return *this;
   }
 

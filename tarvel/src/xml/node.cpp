@@ -248,7 +248,8 @@ void CreateElementNode(std::string_view prefix, std::string_view localName, Ref<
 }
 
 void CreateTextNode(Ref<TextNode> &out) {
-  NodeArena *const arena = NodeArena::Create(TEXT_ARENA_BYTES);
+  // A text that a program composes, unlike one that was parsed, may be a password.
+  NodeArena *const arena = NodeArena::Create(TEXT_ARENA_BYTES, NodeArena::AfterUse::WIPE_AND_FREE);
   out = Ref<TextNode>(arena->New<TextNode>(arena));
 }
 

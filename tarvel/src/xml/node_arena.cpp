@@ -2,6 +2,8 @@
 
 #include "xml/node_arena.h"
 
+#include <tarvel/core/secure_wipe.h>
+
 #include <algorithm>
 #include <cstring>
 
@@ -20,16 +22,23 @@ constexpr std::size_t RoundUp(std::size_t size, std::size_t alignment) noexcept 
 } // namespace
 
 // The arena and its first room are one piece of memory: a node made alone costs one allocation.
-NodeArena *NodeArena::Create(std::size_t firstBytes) {
+NodeArena *NodeArena::Create(std::size_t firstBytes, AfterUse afterUse) {
   const std::size_t room = RoundUp(firstBytes, ALIGNMENT);
-  return new (::operator new(sizeof(NodeArena) + room)) NodeArena(room);
+  return new (::operator new(sizeof(NodeArena) + room)) NodeArena(room, afterUse);
 }
 
-NodeArena::NodeArena(std::size_t firstBytes) noexcept
+NodeArena::NodeArena(std::size_t firstBytes, AfterUse afterUse) noexcept
     : m_free(reinterpret_cast<char *>(this) + sizeof(NodeArena)), m_end(m_free + firstBytes),
-      m_nextBlockBytes(std::clamp(firstBytes, SMALLEST_BLOCK_BYTES, LARGEST_BLOCK_BYTES)) {}
+      m_nextBlockBytes(std::clamp(firstBytes, SMALLEST_BLOCK_BYTES, LARGEST_BLOCK_BYTES)), m_firstBytes(firstBytes),
+      m_afterUse(afterUse) {}
 
 NodeArena::~NodeArena() {
+  if (m_afterUse == AfterUse::WIPE_AND_FREE) {
+    SecureWipe(reinterpret_cast<char *>(this) + sizeof(NodeArena), m_firstBytes);
+    for (Block *block = m_blocks; block; block = block->next) {
+      SecureWipe(block + 1, block->bytes);
+    }
+  }
   while (m_blocks) {
     ::operator delete(std::exchange(m_blocks, m_blocks->next));
   }
@@ -106,6 +115,7 @@ void NodeArena::AddBlock(std::size_t size) {
 char *NodeArena::AllocateBlock(std::size_t size) {
   Block *const block = static_cast<Block *>(::operator new(sizeof(Block) + size));
   block->next = m_blocks;
+  block->bytes = size;
   m_blocks = block;
   return reinterpret_cast<char *>(block + 1);
 }

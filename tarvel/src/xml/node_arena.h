@@ -25,9 +25,12 @@ namespace Xml {
 /// join needs the trees for oneself; to count references does not.
 class NodeArena {
 public:
+  enum class AfterUse : std::uint8_t { FREE, WIPE_AND_FREE };
+
   /// An arena without references. Whoever makes the first node in it takes the first reference by a `Ref` to that node.
   /// @param firstBytes room that is there from the beginning.
-  static NodeArena *Create(std::size_t firstBytes);
+  /// @param afterUse whether the memory is overwritten before it is freed, for what may be secret.
+  static NodeArena *Create(std::size_t firstBytes, AfterUse afterUse = AfterUse::FREE);
 
   NodeArena(const NodeArena &) = delete;
   NodeArena &operator=(const NodeArena &) = delete;
@@ -59,9 +62,10 @@ private:
 
   struct Block {
     Block *next;
+    std::size_t bytes; // behind this header
   };
 
-  explicit NodeArena(std::size_t firstBytes) noexcept;
+  NodeArena(std::size_t firstBytes, AfterUse afterUse) noexcept;
   ~NodeArena();
 
   void *Allocate(std::size_t size);
@@ -89,6 +93,8 @@ private:
   char *m_end;
   Block *m_blocks = nullptr;
   std::size_t m_nextBlockBytes;
+  std::size_t m_firstBytes;
+  AfterUse m_afterUse;
   Ref<Object> m_kept;
 };
 

@@ -1,0 +1,167 @@
+// SPDX-License-Identifier: Apache-2.0
+// A password must not be left behind in the heap. This program replaces the allocation functions of C++, and looks into
+// each piece of memory as it is given back.
+#include "compose/ws_security.h"
+#include "exchange/request_builder_impl.h"
+#include "support/identity.h"
+
+#include <tarvel/core/exception.h>
+#include <tarvel/core/secure_wipe.h>
+
+#include <gtest/gtest.h>
+
+#include <malloc.h>
+
+#include <atomic>
+#include <cstdlib>
+#include <cstring>
+#include <new>
+#include <string_view>
+
+namespace {
+
+std::atomic<const char *> g_secret{nullptr}; // not owned; null while nobody looks
+std::atomic<int> g_found{0};
+
+void LookForSecret(const void *memory) noexcept {
+  const char *const secret = g_secret.load();
+  if (!secret || !memory) {
+    return;
+  }
+  const std::size_t bytes = malloc_usable_size(const_cast<void *>(memory));
+  if (memmem(memory, bytes, secret, std::strlen(secret))) {
+    ++g_found;
+  }
+}
+
+void *Allocate(std::size_t bytes) {
+  // What the last owner left is overwritten, so that only what the code under test wrote is found.
+  void *const memory = std::calloc(1, bytes ? bytes : 1);
+  if (!memory) {
+    throw std::bad_alloc();
+  }
+  return memory;
+}
+
+void Free(void *memory) noexcept {
+  LookForSecret(memory);
+  std::free(memory);
+}
+
+} // namespace
+
+void *operator new(std::size_t bytes) {
+  return Allocate(bytes);
+}
+void *operator new[](std::size_t bytes) {
+  return Allocate(bytes);
+}
+void operator delete(void *memory) noexcept {
+  Free(memory);
+}
+void operator delete[](void *memory) noexcept {
+  Free(memory);
+}
+void operator delete(void *memory, std::size_t) noexcept {
+  Free(memory);
+}
+void operator delete[](void *memory, std::size_t) noexcept {
+  Free(memory);
+}
+
+namespace SsoClient {
+namespace {
+
+/// Counts how many pieces of memory were given back with the secret in them while it lived.
+class Watch {
+public:
+  explicit Watch(const char *secret) {
+    g_found = 0;
+    g_secret = secret;
+  }
+  Watch(const Watch &) = delete;
+  Watch &operator=(const Watch &) = delete;
+  ~Watch() { g_secret = nullptr; }
+
+  int Found() const { return g_found; }
+};
+
+const char LONG_PASSWORD[] = "correct-horse-battery-staple-and-more-than-fits-into-the-string-itself";
+const char SHORT_PASSWORD[] = "tr0ub4dor";
+
+TokenSpec Spec() {
+  TokenSpec spec;
+  spec.tokenLifetimeSec = 600;
+  for (int i = 0; i < 100; ++i) { // a request that outgrows many a buffer
+    spec.audienceRestriction.insert("https://audience.example/" + std::to_string(i));
+  }
+  return spec;
+}
+
+class FreedMemory : public testing::TestWithParam<const char *> {};
+
+TEST_P(FreedMemory, IsFoundToHoldASecretThatNobodyWiped) {
+  const Watch watch(GetParam());
+  delete new std::string(std::string(GetParam()) + std::string(100, 'x'));
+  EXPECT_GT(watch.Found(), 0);
+}
+
+TEST_P(FreedMemory, HoldsNoPasswordOfARequestThatIsGone) {
+  const RequestBuilderImpl plain(boost::none);
+  const RequestBuilderImpl identified(Testing::HolderIdentity());
+  const std::string password = GetParam();
+  const TokenSpec spec = Spec();
+  const Watch watch(GetParam());
+  for (const RequestBuilderImpl *const builder : {&plain, &identified}) {
+    Request request;
+    builder->BuildUserPassTokenRequest("alice", password, spec, request);
+    ASSERT_NE(request.body.find(password), std::string::npos);
+    Request copy = request;
+    request = Request();
+    builder->BuildUserPassTokenRequest("alice", password, spec, copy);
+  }
+  EXPECT_EQ(watch.Found(), 0);
+}
+
+TEST_P(FreedMemory, HoldsNoPasswordOfARequestThatCannotBeBuilt) {
+  const RequestBuilderImpl builder(boost::none);
+  const std::string password = GetParam();
+  const std::string uncarriable = password + "\x01";
+  TokenSpec spec = Spec();
+  const Watch watch(GetParam());
+  Request request;
+  EXPECT_THROW(builder.BuildUserPassTokenRequest("alice", uncarriable, spec, request),
+               Tarvel::InvalidArgumentException);
+  spec.delegateTo = std::string("\x01");
+  EXPECT_THROW(builder.BuildUserPassTokenRequest("alice", password, spec, request), Tarvel::InvalidArgumentException);
+  EXPECT_EQ(watch.Found(), 0);
+}
+
+INSTANTIATE_TEST_SUITE_P(LongAndShort, FreedMemory, testing::Values(LONG_PASSWORD, SHORT_PASSWORD),
+                         [](const auto &password) { return password.param == LONG_PASSWORD ? "Long" : "Short"; });
+
+TEST(SecureWipe, OverwritesAndEmptiesATextTogetherWithWhatALongerValueLeftBehind) {
+  std::string text = LONG_PASSWORD;
+  text.resize(3); // the rest stays in the memory
+  const char *const memory = text.data();
+  const std::size_t bytes = text.capacity();
+  Tarvel::SecureWipe(text);
+  EXPECT_EQ(text, "");
+  ASSERT_EQ(text.data(), memory);
+  EXPECT_EQ(std::string_view(memory, bytes), std::string(bytes, '\0'));
+}
+
+TEST(SecureWipe, OverwritesAListOfBytesAndTakesEmptyOnes) {
+  std::vector<std::uint8_t> bytes = {1, 2, 3};
+  const std::uint8_t *const memory = bytes.data();
+  Tarvel::SecureWipe(bytes);
+  EXPECT_TRUE(bytes.empty());
+  EXPECT_EQ(std::string(memory, memory + 3), std::string(3, '\0'));
+  Tarvel::SecureWipe(bytes);
+  std::vector<std::uint8_t> empty;
+  Tarvel::SecureWipe(empty);
+  Tarvel::SecureWipe(nullptr, 0);
+}
+
+} // namespace
+} // namespace SsoClient
