@@ -1,0 +1,152 @@
+// SPDX-License-Identifier: Apache-2.0
+// Each request against the schemas of its standards: those that Debian packages, and those in tests/data/schemas.
+//
+// Every element of every request validates. What the schemas leave open because the wire form is fixed otherwise:
+// - wst:UseKey/@Sig is a plain identifier, where WS-Trust 1.3 wants a URI reference to the signature ("#..."). As an
+//   xs:anyURI it is valid all the same.
+// - wst:BinaryExchange/@ValueType is the SPNEGO URI of the WS-Trust of February 2005: WS-Trust 1.3 leaves it open.
+// - wsse11:TokenType has "tokenprofile" where the SAML Token Profile 1.1 has "token-profile": the attribute is open.
+// - an audience or an advice source that is not a URI goes out as it is, though xs:anyURI is what the schemas say of it.
+//   The samples have URIs.
+#include "exchange/request_builder_impl.h"
+#include "integration/signed_requests/foreign_document.h"
+#include "support/data_file.h"
+#include "support/sample_requests.h"
+
+#include <libxml/xmlIO.h>
+#include <libxml/xmlschemas.h>
+
+#include <gtest/gtest.h>
+
+#include <cstdarg>
+#include <cstdio>
+#include <memory>
+
+namespace SsoClient {
+namespace {
+
+using namespace Testing;
+
+void Gather(void *texts, const char *format, ...) __attribute__((format(printf, 2, 3)));
+void Gather(void *texts, const char *format, ...) {
+  char line[1024];
+  va_list arguments;
+  va_start(arguments, format);
+  std::vsnprintf(line, sizeof line, format, arguments);
+  va_end(arguments);
+  *static_cast<std::string *>(texts) += line;
+}
+
+/// The schemas that no network is asked for.
+class Schemas {
+public:
+  Schemas() {
+    xmlSetExternalEntityLoader(xmlNoNetExternalEntityLoader);
+    const std::string path = std::string(TEST_DATA_DIR) + "/schemas/request.xsd";
+    std::string warnings; // an import that was imported already, more than once
+    const std::unique_ptr<xmlSchemaParserCtxt, decltype(&xmlSchemaFreeParserCtxt)> parser(
+        xmlSchemaNewParserCtxt(path.c_str()), &xmlSchemaFreeParserCtxt);
+    xmlSchemaSetParserErrors(parser.get(), Gather, Gather, &warnings);
+    m_schema.reset(xmlSchemaParse(parser.get()));
+    if (!m_schema) {
+      throw std::runtime_error("the schemas do not load (packages xmltooling-schemas, opensaml-schemas): " + warnings);
+    }
+  }
+
+  /// What is wrong with the document; empty when it is valid.
+  std::string Judge(const std::string &xml) const {
+    const ForeignDocument document(xml);
+    std::string errors;
+    const std::unique_ptr<xmlSchemaValidCtxt, decltype(&xmlSchemaFreeValidCtxt)> context(
+        xmlSchemaNewValidCtxt(m_schema.get()), &xmlSchemaFreeValidCtxt);
+    xmlSchemaSetValidErrors(context.get(), Gather, Gather, &errors);
+    const int result = xmlSchemaValidateDoc(context.get(), document.Get());
+    return result == 0 ? std::string() : errors.empty() ? "internal error" : errors;
+  }
+
+private:
+  std::unique_ptr<xmlSchema, decltype(&xmlSchemaFree)> m_schema{nullptr, &xmlSchemaFree};
+};
+
+class ValidRequest : public testing::TestWithParam<SampleRequest> {
+protected:
+  static const Schemas &GetSchemas() {
+    static const Schemas schemas;
+    return schemas;
+  }
+};
+
+TEST_P(ValidRequest, ValidatesAgainstTheSchemas) {
+  Request request;
+  GetParam().build(request);
+  EXPECT_EQ(GetSchemas().Judge(request.body), "");
+}
+
+TEST_P(ValidRequest, ValidatesWithTheRealClockAndIdentifiers) {
+  for (int i = 0; i < 20; ++i) { // a UUID may begin with a digit or a letter
+    Request request;
+    GetParam().build(request);
+    EXPECT_EQ(GetSchemas().Judge(request.body), "");
+  }
+}
+
+INSTANTIATE_TEST_SUITE_P(EveryRequest, ValidRequest, testing::ValuesIn(SampleRequests()),
+                         [](const auto &sample) { return TestName(sample.param); });
+
+TEST_F(ValidRequest, HoldsEveryKindOfIssuedToken) {
+  const RequestBuilderImpl builder{HolderIdentity()};
+  for (const char *const name :
+       {"bearer", "holder-of-key", "full", "delegated", "bearer-5k", "style-default-namespace"}) {
+    const std::string xml = ReadDataFile(std::string("tokens/") + name + ".xml");
+    const TokenStandIn token(AttributeOf(ForeignDocument(xml).Root(), "ID"), xml, SamlToken::HOLDER_OF_KEY);
+    Request request;
+    builder.BuildExchangeTokenRequest(token, DelegatedSpec(), request);
+    EXPECT_EQ(GetSchemas().Judge(request.body), "") << name;
+    builder.BuildRenewRequest(token, 600, request);
+    EXPECT_EQ(GetSchemas().Judge(request.body), "") << name;
+    builder.BuildValidateSubjectRequest(token, request);
+    EXPECT_EQ(GetSchemas().Judge(request.body), "") << name;
+  }
+}
+
+/// That the schemas would notice: each replacement in the fullest request must make it invalid.
+TEST_F(ValidRequest, IsNoLongerOneAfterASmallMistake) {
+  const std::pair<const char *, const char *> mistakes[] = {
+      {"wsu:Created", "wsu:Make"},
+      {"wsse:Username>", "wsse:UserName>"},
+      {"wsse:BinarySecurityToken", "wsse:BinarySecurity"},
+      {"URI=\"#holder", "uri=\"#holder"},
+      {"wst:Lifetime", "wst:LifeTime"},
+      {"wst:Delegatable", "wst:Delegable"},
+      {">true</wst:Delegatable>", ">yes</wst:Delegatable>"},
+      {"OK=\"false\"", "Ok=\"false\""},
+      {"200512/Issue", "200512/issue"},
+      {"200512/PublicKey", "200512/Publickey"},
+      {"wst:Participants", "wst:Participant"},
+      {"wsa:Address", "wsa:Adress"},
+      {"AdviceSource", "Source"},
+      {"xsi:type=\"xs:string\"", "xsi:type=\"xs:text\""},
+      {"wst:UseKey", "wst:Usekey"},
+      {"Sig=\"", "sig=\""},
+      {"ds:DigestMethod", "ds:DigestMetod"},
+      {"Z</wsu:Created>", "</wsu:Created>"},
+      {"soapenv:Header>", "soapenv:Heading>"},
+  };
+  Request request;
+  const RequestBuilderImpl builder{HolderIdentity()};
+  builder.BuildUserPassTokenRequest("alice", "password", FullSpec(), request);
+  ASSERT_EQ(GetSchemas().Judge(request.body), "");
+  for (const auto &[right, wrong] : mistakes) {
+    std::string changed = request.body;
+    std::size_t count = 0;
+    for (std::size_t at = 0; (at = changed.find(right, at)) != std::string::npos; at += std::string(wrong).size()) {
+      changed.replace(at, std::string(right).size(), wrong);
+      ++count;
+    }
+    EXPECT_GT(count, 0u) << right;
+    EXPECT_NE(GetSchemas().Judge(changed), "") << right << " written as " << wrong;
+  }
+}
+
+} // namespace
+} // namespace SsoClient
