@@ -6,6 +6,7 @@
 #include <libxml/parser.h>
 #include <libxml/xmlIO.h>
 
+#include <mutex>
 #include <stdexcept>
 
 namespace Testing {
@@ -41,6 +42,8 @@ xmlNode *NextInDocument(xmlNode *node) {
   return node ? node->next : nullptr;
 }
 
+void SayNothing(void *, const char *, ...) {}
+
 template <typename Predicate>
 xmlNode *FindElement(xmlDoc &document, Predicate isWanted) {
   for (xmlNode *node = document.children; node && node->type != XML_DOCUMENT_NODE; node = NextInDocument(node)) {
@@ -54,6 +57,8 @@ xmlNode *FindElement(xmlDoc &document, Predicate isWanted) {
 } // namespace
 
 XmlDocHandle ParseWithLibxml2(std::string_view text) {
+  static std::once_flag once;
+  std::call_once(once, [] { xmlSetGenericErrorFunc(nullptr, SayNothing); }); // refusals are expected by the hundred
   return XmlDocHandle(xmlReadMemory(text.data(), static_cast<int>(text.size()), nullptr, nullptr,
                                     XML_PARSE_NONET | XML_PARSE_NOENT | XML_PARSE_NOERROR | XML_PARSE_NOWARNING));
 }
@@ -65,6 +70,18 @@ xmlNode *ElementOfLibxml2(xmlDoc &document, std::size_t index) {
 xmlNode *ElementOfLibxml2(xmlDoc &document, std::string_view localName) {
   return FindElement(
       document, [localName](const xmlNode &node) { return localName == reinterpret_cast<const char *>(node.name); });
+}
+
+bool HasRelativeNamespaceName(xmlDoc &document) {
+  return FindElement(document, [](const xmlNode &node) {
+           for (const xmlNs *declared = node.nsDef; declared; declared = declared->next) {
+             const std::string_view name = reinterpret_cast<const char *>(declared->href);
+             if (!name.empty() && name.find(':') == std::string_view::npos) {
+               return true;
+             }
+           }
+           return false;
+         }) != nullptr;
 }
 
 std::string CanonicalFormOfLibxml2(xmlDoc &document, const xmlNode *apex, const xmlNode *omitted,

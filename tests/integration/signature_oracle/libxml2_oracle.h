@@ -28,6 +28,10 @@ xmlNode *ElementOfLibxml2(xmlDoc &document, std::size_t index);
 /// The first element of that local name in document order, or null.
 xmlNode *ElementOfLibxml2(xmlDoc &document, std::string_view localName);
 
+/// Whether a namespace is declared anywhere whose name has no scheme. libxml2 then canonicalises no part of the document, be
+/// the declaration in that part or not.
+bool HasRelativeNamespaceName(xmlDoc &document);
+
 struct OracleMethod {
   bool isExclusive = false;
   bool withComments = false;

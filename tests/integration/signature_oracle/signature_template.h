@@ -1,0 +1,23 @@
+// SPDX-License-Identifier: Apache-2.0
+/// @file
+/// Signatures to be filled in for generated documents, and ways to change a signed document.
+
+#pragma once
+
+#include "generated_document.h"
+
+#include <string>
+#include <string_view>
+
+namespace Testing {
+
+/// The document with a signature template as the last child of its document element: any canonicalisation, one to three
+/// references to the document, its document element or another element, with every transform and digest of the profile.
+std::string AddSignatureTemplate(const GeneratedDocument &document, std::string_view signatureUri,
+                                 RandomSource &random);
+
+/// A signed document after a small change that may or may not matter: to content, to the signature, to what stands around
+/// it. The result need not be well-formed.
+std::string ChangeSomething(std::string text, RandomSource &random);
+
+} // namespace Testing
