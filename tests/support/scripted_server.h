@@ -1,0 +1,145 @@
+// SPDX-License-Identifier: Apache-2.0
+/// @file
+/// A TCP or TLS server on loopback inside the test process, whose every move is scripted. It rests on sockets and OpenSSL
+/// alone, so that it shares nothing with what it tests.
+
+#pragma once
+
+#include <atomic>
+#include <cstddef>
+#include <functional>
+#include <list>
+#include <memory>
+#include <mutex>
+#include <optional>
+#include <string>
+#include <string_view>
+#include <thread>
+
+struct ssl_st;
+struct ssl_ctx_st;
+
+namespace Testing {
+
+/// How a server speaks TLS. The certificate is one of tests/data/tls, by name.
+struct TlsSettings {
+  std::string certificate = "localhost";
+  int minimumVersion = 0;      ///< as TLS1_2_VERSION; 0 for no limit
+  int maximumVersion = 0;      ///< likewise
+  bool demandsClient = false;  ///< a certificate that chains to "authority" through "intermediate"
+  bool allowsWeakness = false; ///< security level 0, without which OpenSSL offers no TLS 1.1
+  bool resumesSessions = true;
+};
+
+/// One accepted connection, in the hands of the script, on a thread of its own. Every wait is bounded: a call that gets no
+/// answer in 30 seconds, or in which the server is stopped, ends like one whose peer has gone.
+class ServerConnection {
+public:
+  ServerConnection(int descriptor, ssl_ctx_st *tls);
+  ServerConnection(const ServerConnection &) = delete;
+  ServerConnection &operator=(const ServerConnection &) = delete;
+  ~ServerConnection();
+
+  /// Shakes hands, when the server has TLS; whether that went well. A script calls it first, unless it wants to disturb
+  /// the handshake.
+  bool ShakeHands();
+
+  /// At most `limit` bytes; empty when the peer has ended the connection in whatever way.
+  std::string ReadSome(std::size_t limit = 65536);
+  /// Exactly `length` bytes, or fewer when the peer ends.
+  std::string ReadExactly(std::size_t length);
+  /// Up to and with the first `delimiter`, or what there is when the peer ends. Reads on from there next time.
+  std::string ReadUntil(std::string_view delimiter);
+  /// One HTTP/1.1 request: its header, and as many bytes more as its Content-Length says.
+  std::string ReadRequest();
+
+  /// Whether all bytes were taken.
+  bool Write(std::string_view bytes);
+
+  /// Past TLS, if there is any: what stands on the wire.
+  std::string ReadRawSome(std::size_t limit = 65536);
+  bool WriteRaw(std::string_view bytes);
+
+  /// Reads, and drops, until the peer ends: a server that never answers.
+  void Stall();
+
+  /// Ends in order: TLS's closing notice, then TCP's end. What happens without a call when the script returns.
+  void Close();
+  /// Ends TCP in order, without TLS's notice.
+  void CloseWithoutNotice();
+  /// Ends with a TCP reset.
+  void Reset();
+
+  bool WasResumed() const;
+  /// What the client sent in its server name extension; empty for none.
+  std::string GetServerName() const;
+  /// The common name of the client's certificate; empty for none.
+  std::string GetClientName() const;
+
+  /// Wakes whatever waits in a call, from another thread.
+  void Interrupt() noexcept;
+
+private:
+  std::ptrdiff_t Receive(char *buffer, std::size_t length);
+  void EndDescriptor() noexcept;
+
+  std::mutex m_mutex; // guards the descriptor's end
+  int m_descriptor;   // -1 when closed
+  ssl_st *m_tls;      // null for none
+  bool m_established = false;
+  std::string m_ahead; // read, but not asked for yet
+};
+
+class ScriptedServer {
+public:
+  /// Runs once for each connection, several at once; the connection ends when it returns.
+  using Script = std::function<void(ServerConnection &)>;
+
+  /// Listens on a free port of 127.0.0.1, or of ::1.
+  explicit ScriptedServer(Script script, std::optional<TlsSettings> tls = std::nullopt, bool v6 = false);
+  ScriptedServer(const ScriptedServer &) = delete;
+  ScriptedServer &operator=(const ScriptedServer &) = delete;
+  /// Ends all connections and waits for their scripts.
+  ~ScriptedServer();
+
+  int GetPort() const noexcept { return m_port; }
+  /// How many connections have been accepted so far.
+  int GetConnectionCount() const noexcept { return m_accepted; }
+
+private:
+  struct Running {
+    std::unique_ptr<ServerConnection> connection;
+    std::thread thread;
+    bool ended = false;
+  };
+
+  void Accept();
+  void Start(int descriptor);
+  void Reap(bool all);
+
+  const Script m_script;
+  ssl_ctx_st *m_tls = nullptr;
+  int m_listener = -1;
+  int m_port = 0;
+  std::atomic<int> m_accepted{0};
+  std::atomic<bool> m_stopping{false};
+  std::mutex m_mutex; // guards m_running
+  std::list<Running> m_running;
+  std::thread m_acceptor;
+};
+
+/// A port of 127.0.0.1 on which nobody listens: connecting is refused as long as this lives.
+class UnusedPort {
+public:
+  UnusedPort();
+  UnusedPort(const UnusedPort &) = delete;
+  UnusedPort &operator=(const UnusedPort &) = delete;
+  ~UnusedPort();
+  int GetPort() const noexcept { return m_port; }
+
+private:
+  int m_descriptor = -1; // bound, and so nobody else's, but not listening
+  int m_port = 0;
+};
+
+} // namespace Testing
