@@ -8,6 +8,7 @@
 #include <algorithm>
 #include <array>
 #include <cctype>
+#include <chrono>
 #include <csignal>
 #include <cstring>
 #include <netinet/in.h>
@@ -231,6 +232,11 @@ void ServerConnection::Stall() {
   }
 }
 
+void ServerConnection::WaitForInterrupt() {
+  std::unique_lock<std::mutex> lock(m_mutex);
+  m_interrupted.wait_for(lock, std::chrono::seconds(WAIT_SECONDS), [this] { return m_isInterrupted; });
+}
+
 void ServerConnection::Close() {
   if (m_established && m_descriptor >= 0) {
     ERR_clear_error();
@@ -269,9 +275,15 @@ void ServerConnection::EndDescriptor() noexcept {
 
 void ServerConnection::Interrupt() noexcept {
   const std::lock_guard<std::mutex> lock(m_mutex);
+  m_isInterrupted = true;
+  m_interrupted.notify_all();
   if (m_descriptor >= 0) {
     ::shutdown(m_descriptor, SHUT_RDWR);
   }
+}
+
+bool ServerConnection::ReceivedClosingNotice() const {
+  return m_tls && (SSL_get_shutdown(m_tls) & SSL_RECEIVED_SHUTDOWN) != 0;
 }
 
 bool ServerConnection::WasResumed() const {
@@ -354,6 +366,12 @@ void ScriptedServer::Reap(bool all) {
   for (Running &running : ended) {
     running.thread.join();
   }
+}
+
+std::size_t ScriptedServer::GetOpenCount() const {
+  const std::lock_guard<std::mutex> lock(m_mutex);
+  return static_cast<std::size_t>(
+      std::count_if(m_running.begin(), m_running.end(), [](const Running &running) { return !running.ended; }));
 }
 
 UnusedPort::UnusedPort() : m_descriptor(BindLoopback(false, m_port)) {}

@@ -6,6 +6,7 @@
 #pragma once
 
 #include <atomic>
+#include <condition_variable>
 #include <cstddef>
 #include <functional>
 #include <list>
@@ -63,6 +64,9 @@ public:
   /// Reads, and drops, until the peer ends: a server that never answers.
   void Stall();
 
+  /// Reads nothing and does nothing until the server is stopped, so that what the peer sends piles up.
+  void WaitForInterrupt();
+
   /// Ends in order: TLS's closing notice, then TCP's end. What happens without a call when the script returns.
   void Close();
   /// Ends TCP in order, without TLS's notice.
@@ -70,6 +74,8 @@ public:
   /// Ends with a TCP reset.
   void Reset();
 
+  /// Whether the client has sent TLS's closing notice, as far as has been read.
+  bool ReceivedClosingNotice() const;
   bool WasResumed() const;
   /// What the client sent in its server name extension; empty for none.
   std::string GetServerName() const;
@@ -84,8 +90,10 @@ private:
   void EndDescriptor() noexcept;
 
   std::mutex m_mutex; // guards the descriptor's end
-  int m_descriptor;   // -1 when closed
-  ssl_st *m_tls;      // null for none
+  std::condition_variable m_interrupted;
+  bool m_isInterrupted = false;
+  int m_descriptor; // -1 when closed
+  ssl_st *m_tls;    // null for none
   bool m_established = false;
   std::string m_ahead; // read, but not asked for yet
 };
@@ -105,6 +113,8 @@ public:
   int GetPort() const noexcept { return m_port; }
   /// How many connections have been accepted so far.
   int GetConnectionCount() const noexcept { return m_accepted; }
+  /// How many connections' scripts have not ended.
+  std::size_t GetOpenCount() const;
 
 private:
   struct Running {
@@ -119,11 +129,11 @@ private:
 
   const Script m_script;
   ssl_ctx_st *m_tls = nullptr;
+  int m_port = 0; // before the listener, which sets it
   int m_listener = -1;
-  int m_port = 0;
   std::atomic<int> m_accepted{0};
   std::atomic<bool> m_stopping{false};
-  std::mutex m_mutex; // guards m_running
+  mutable std::mutex m_mutex; // guards m_running
   std::list<Running> m_running;
   std::thread m_acceptor;
 };
@@ -138,8 +148,8 @@ public:
   int GetPort() const noexcept { return m_port; }
 
 private:
+  int m_port = 0;        // before the descriptor, which sets it
   int m_descriptor = -1; // bound, and so nobody else's, but not listening
-  int m_port = 0;
 };
 
 } // namespace Testing

@@ -59,6 +59,11 @@ SessionHandle SessionCache::Take(const std::string &key) {
   return {};
 }
 
+std::size_t SessionCache::GetSize() const {
+  const std::lock_guard<std::mutex> lock(m_mutex);
+  return m_entries.size();
+}
+
 void SessionCache::Clear() {
   const std::lock_guard<std::mutex> lock(m_mutex);
   m_byKey.clear();

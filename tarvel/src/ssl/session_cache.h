@@ -31,6 +31,8 @@ public:
 
   void Clear();
 
+  std::size_t GetSize() const;
+
 private:
   struct Entry {
     std::string key;
@@ -38,7 +40,7 @@ private:
   };
   using Entries = std::list<Entry>;
 
-  std::mutex m_mutex;                                    // guards all that follows
+  mutable std::mutex m_mutex;                            // guards all that follows
   Entries m_entries;                                     // the oldest first
   std::multimap<std::string, Entries::iterator> m_byKey; // within a key, the oldest first
 };

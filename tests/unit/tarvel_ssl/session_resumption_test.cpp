@@ -1,0 +1,152 @@
+// SPDX-License-Identifier: Apache-2.0
+
+#include "ssl/session_cache.h"
+#include "unit/tarvel_ssl/tls_client.h"
+
+#include <gtest/gtest.h>
+
+#include <openssl/ssl.h>
+
+#include <string>
+
+namespace Tarvel {
+namespace Ssl {
+namespace {
+
+using Testing::CreateTrustingContext;
+using Testing::ScriptedServer;
+using Testing::ServerConnection;
+using Testing::TlsCertificate;
+using Testing::TlsClient;
+using Testing::TlsSettings;
+
+/// Says what the server thinks of the handshake.
+void TellWhetherResumed(ServerConnection &connection) {
+  if (connection.ShakeHands()) {
+    connection.Write(connection.WasResumed() ? "resumed" : "full");
+    connection.ReadSome();
+  }
+}
+
+class SessionResumption : public testing::TestWithParam<int> {
+protected:
+  TlsSettings Settings() const {
+    TlsSettings settings;
+    settings.minimumVersion = settings.maximumVersion = GetParam();
+    return settings;
+  }
+
+  /// "full" or "resumed", on which both sides must agree, or the message of what went wrong.
+  std::string Connect(const std::string &host = "localhost", const std::string &parameter = "") {
+    TlsClient client(m_context, m_server.GetPort());
+    if (const std::string failure = client.ShakeHands(host, parameter); !failure.empty()) {
+      return failure;
+    }
+    std::string told = client.Read();
+    EXPECT_EQ(client.GetStream()->WasResumed(), told == "resumed");
+    client.GetStream()->Close();
+    return told;
+  }
+
+  const Ref<SSLContext> m_context = CreateTrustingContext();
+  ScriptedServer m_server{TellWhetherResumed, Settings()};
+};
+
+TEST_P(SessionResumption, TheSecondConnectionAndAllLaterOnesAreResumed) {
+  EXPECT_EQ(Connect(), "full");
+  for (int i = 0; i < 5; ++i) {
+    EXPECT_EQ(Connect(), "resumed") << i;
+  }
+}
+
+TEST_P(SessionResumption, ASessionIsResumedThoughItsConnectionWasOnlyDropped) {
+  {
+    TlsClient client(m_context, m_server.GetPort());
+    ASSERT_EQ(client.ShakeHands(), "");
+    ASSERT_EQ(client.Read(), "full");
+  }
+  EXPECT_EQ(Connect(), "resumed");
+}
+
+TEST_P(SessionResumption, EveryHostNameHasSessionsOfItsOwn) {
+  EXPECT_EQ(Connect("localhost"), "full");
+  EXPECT_EQ(Connect("127.0.0.1"), "full");
+  EXPECT_EQ(Connect("other.example"),
+            "The TLS handshake with other.example failed: the server's certificate was not accepted: hostname mismatch "
+            "(certificate \"CN=localhost\")");
+  EXPECT_EQ(Connect("LOCALHOST"), "resumed");
+  EXPECT_EQ(Connect("127.0.0.1"), "resumed");
+}
+
+TEST_P(SessionResumption, EveryThumbprintHasSessionsOfItsOwn) {
+  const std::string right = TlsCertificate("localhost")->GetSha256Thumbprint();
+  const std::string wrong = TlsCertificate("expired")->GetSha256Thumbprint();
+  EXPECT_EQ(Connect("other.example", right), "full");
+  EXPECT_EQ(Connect("other.example", right), "resumed");
+  // A session whose name nobody checked must not let a connection through whose name has to be checked.
+  EXPECT_NE(Connect("other.example"), "resumed");
+  EXPECT_EQ(Connect("localhost"), "full");
+  EXPECT_EQ(Connect("localhost"), "resumed");
+  EXPECT_EQ(Connect("localhost", wrong),
+            "The TLS handshake with localhost failed: the server's certificate has the SHA-256 thumbprint " + right +
+                " instead of " + wrong);
+  EXPECT_EQ(Connect("localhost", right), "full");
+  EXPECT_EQ(Connect("localhost", right), "resumed");
+}
+
+TEST_P(SessionResumption, AnotherContextKnowsNothingOfThem) {
+  EXPECT_EQ(Connect(), "full");
+  TlsClient client(CreateTrustingContext(), m_server.GetPort());
+  EXPECT_EQ(client.ShakeHands(), "");
+  EXPECT_EQ(client.Read(), "full");
+}
+
+TEST_P(SessionResumption, ChangingWhatIsTrustedForgetsThem) {
+  EXPECT_EQ(Connect(), "full");
+  m_context->TrustCertificates({TlsCertificate("unknown-authority")});
+  EXPECT_EQ(Connect(), "full");
+}
+
+TEST_P(SessionResumption, AServerThatForgotGetsAFullHandshake) {
+  TlsSettings settings = Settings();
+  settings.resumesSessions = false;
+  ScriptedServer forgetful(TellWhetherResumed, settings);
+  for (int i = 0; i < 3; ++i) {
+    TlsClient client(m_context, forgetful.GetPort());
+    EXPECT_EQ(client.ShakeHands(), "");
+    EXPECT_EQ(client.Read(), "full");
+    client.GetStream()->Close();
+  }
+}
+
+INSTANTIATE_TEST_SUITE_P(Versions, SessionResumption, testing::Values(TLS1_2_VERSION, TLS1_3_VERSION),
+                         [](const auto &version) { return version.param == TLS1_2_VERSION ? "TLS12" : "TLS13"; });
+
+TEST(SessionCache, ForgetsWhatCannotBeResumed) {
+  SessionCache cache;
+  cache.Put("key", SessionHandle(SSL_SESSION_new())); // no identifier, no ticket, no certificate
+  EXPECT_FALSE(cache.Take("key"));
+  EXPECT_FALSE(cache.Take("key"));
+}
+
+TEST(SessionCache, IsBounded) {
+  SessionCache cache;
+  for (int i = 0; i < 5000; ++i) {
+    cache.Put("key" + std::to_string(i % 100), SessionHandle(SSL_SESSION_new()));
+  }
+  EXPECT_LE(cache.GetSize(), 512u);
+  for (int i = 0; i < 5000; ++i) {
+    cache.Put("one", SessionHandle(SSL_SESSION_new()));
+  }
+  EXPECT_LE(cache.GetSize(), 512u);
+  cache.Clear();
+  EXPECT_EQ(cache.GetSize(), 0u);
+  for (int i = 0; i < 5000; ++i) {
+    cache.Put("one", SessionHandle(SSL_SESSION_new()));
+  }
+  EXPECT_LE(cache.GetSize(), 64u);
+}
+
+} // namespace
+} // namespace Ssl
+} // namespace Tarvel

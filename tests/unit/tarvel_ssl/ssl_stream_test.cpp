@@ -1,0 +1,363 @@
+// SPDX-License-Identifier: Apache-2.0
+
+#include "unit/tarvel_ssl/tls_client.h"
+
+#include "support/process_resources.h"
+
+#include <tarvel/core/exception.h>
+
+#include <gtest/gtest.h>
+
+#include <openssl/err.h>
+#include <openssl/ssl.h>
+
+#include <future>
+#include <string>
+#include <vector>
+
+namespace Tarvel {
+namespace Ssl {
+namespace {
+
+using Testing::Completion;
+using Testing::CreateTrustingContext;
+using Testing::PATIENCE;
+using Testing::ScriptedServer;
+using Testing::ServerConnection;
+using Testing::TlsClient;
+using Testing::TlsSettings;
+
+void Echo(ServerConnection &connection) {
+  if (!connection.ShakeHands()) {
+    return;
+  }
+  for (std::string some = connection.ReadSome(); !some.empty(); some = connection.ReadSome()) {
+    connection.Write(some);
+  }
+}
+
+TEST(SSLStream, ExchangesBytesOverEachAllowedVersion) {
+  for (const int version : {TLS1_2_VERSION, TLS1_3_VERSION}) {
+    TlsSettings settings;
+    settings.minimumVersion = settings.maximumVersion = version;
+    ScriptedServer server(Echo, settings);
+    TlsClient client(CreateTrustingContext(), server.GetPort());
+    ASSERT_EQ(client.ShakeHands(), "") << version;
+    EXPECT_EQ(client.Write("hello"), "");
+    EXPECT_EQ(client.Read(), "hello");
+    EXPECT_FALSE(client.GetStream()->WasResumed());
+  }
+}
+
+TEST(SSLStream, SendsTheServerNameButNoAddress) {
+  std::promise<std::string> names[2];
+  int next = 0;
+  ScriptedServer server(
+      [&](ServerConnection &connection) {
+        connection.ShakeHands();
+        names[next++].set_value(connection.GetServerName());
+      },
+      TlsSettings());
+  TlsClient byName(CreateTrustingContext(), server.GetPort());
+  EXPECT_EQ(byName.ShakeHands("LocalHost."), "");
+  EXPECT_EQ(names[0].get_future().get(), "localhost");
+  TlsClient byAddress(CreateTrustingContext(), server.GetPort());
+  EXPECT_EQ(byAddress.ShakeHands("127.0.0.1"), "");
+  EXPECT_EQ(names[1].get_future().get(), "");
+}
+
+TEST(SSLStream, ChecksAddressesAgainstTheCertificate) {
+  ScriptedServer server(Echo, TlsSettings());
+  for (const char *host : {"127.0.0.1", "::1", "[::1]", "::1%lo"}) {
+    TlsClient client(CreateTrustingContext(), server.GetPort());
+    EXPECT_EQ(client.ShakeHands(host), "") << host;
+  }
+  TlsClient client(CreateTrustingContext(), server.GetPort());
+  EXPECT_EQ(client.ShakeHands("127.0.0.2"),
+            "The TLS handshake with 127.0.0.2 failed: the server's certificate was not accepted: IP address mismatch "
+            "(certificate \"CN=localhost\")");
+}
+
+TEST(SSLStream, MovesLargeMessagesBothWays) {
+  ScriptedServer server(
+      [](ServerConnection &connection) {
+        connection.ShakeHands();
+        connection.Write(connection.ReadExactly(4u << 20));
+      },
+      TlsSettings());
+  TlsClient client(CreateTrustingContext(), server.GetPort());
+  ASSERT_EQ(client.ShakeHands(), "");
+  std::string message(4u << 20, '\0');
+  for (std::size_t i = 0; i < message.size(); ++i) {
+    message[i] = static_cast<char>(i * 31 + i / 4096);
+  }
+  EXPECT_EQ(client.Write(message), "");
+  std::string answer;
+  while (answer.size() < message.size()) {
+    const std::string some = client.Read();
+    ASSERT_FALSE(client.HasFailed()) << some;
+    answer += some;
+  }
+  EXPECT_TRUE(answer == message);
+}
+
+TEST(SSLStream, ReadsTheClosingNoticeAsTheOrderlyEnd) {
+  ScriptedServer server(
+      [](ServerConnection &connection) {
+        connection.ShakeHands();
+        connection.Write("bye");
+      },
+      TlsSettings());
+  TlsClient client(CreateTrustingContext(), server.GetPort());
+  ASSERT_EQ(client.ShakeHands(), "");
+  EXPECT_EQ(client.Read(), "bye");
+  EXPECT_EQ(client.Read(), "");
+  EXPECT_FALSE(client.HasFailed());
+  EXPECT_EQ(client.Read(), "");
+  EXPECT_FALSE(client.HasFailed());
+}
+
+TEST(SSLStream, AnEndWithoutClosingNoticeIsAFailure) {
+  ScriptedServer server(
+      [](ServerConnection &connection) {
+        connection.ShakeHands();
+        connection.Write("half");
+        connection.CloseWithoutNotice();
+      },
+      TlsSettings());
+  TlsClient client(CreateTrustingContext(), server.GetPort());
+  ASSERT_EQ(client.ShakeHands(), "");
+  EXPECT_EQ(client.Read(), "half");
+  const std::string failure =
+      "The TLS connection to localhost broke: the server ended the connection without TLS's closing notice";
+  EXPECT_EQ(client.Read(), failure);
+  EXPECT_TRUE(client.HasFailed());
+  EXPECT_EQ(client.Read(), failure);
+  EXPECT_EQ(client.Write("x"), failure);
+}
+
+TEST(SSLStream, ClosingSendsTheClosingNotice) {
+  std::promise<bool> noticed;
+  ScriptedServer server(
+      [&](ServerConnection &connection) {
+        connection.ShakeHands();
+        connection.ReadSome();
+        noticed.set_value(connection.ReceivedClosingNotice());
+      },
+      TlsSettings());
+  TlsClient client(CreateTrustingContext(), server.GetPort());
+  ASSERT_EQ(client.ShakeHands(), "");
+  client.GetStream()->Close();
+  EXPECT_TRUE(noticed.get_future().get());
+}
+
+TEST(SSLStream, ReportsAResetBeforeTheHandshake) {
+  std::promise<void> connected; // a reset that comes too soon makes the connect fail
+  ScriptedServer server(
+      [future = connected.get_future().share()](ServerConnection &connection) {
+        future.wait_for(PATIENCE);
+        connection.Reset();
+      },
+      TlsSettings());
+  TlsClient client(CreateTrustingContext(), server.GetPort());
+  connected.set_value();
+  const std::string message = client.ShakeHands();
+  EXPECT_EQ(message.rfind("The TLS handshake with localhost failed: The connection to 127.0.0.1:", 0), 0u) << message;
+  EXPECT_TRUE(client.FailedInHandshake());
+}
+
+TEST(SSLStream, ReportsAResetWithinTheHandshake) {
+  ScriptedServer server(
+      [](ServerConnection &connection) {
+        connection.ReadRawSome();
+        connection.WriteRaw(std::string("\x16\x03\x03\x00\x7A\x02\x00", 7)); // the beginning of a server's hello
+        connection.Reset();
+      },
+      TlsSettings());
+  TlsClient client(CreateTrustingContext(), server.GetPort());
+  EXPECT_EQ(client.ShakeHands(), "The TLS handshake with localhost failed: The connection to 127.0.0.1:" +
+                                     std::to_string(server.GetPort()) + " broke: Connection reset by peer");
+}
+
+TEST(SSLStream, ReportsAnEndWithinTheHandshake) {
+  ScriptedServer server([](ServerConnection &connection) { connection.ReadRawSome(); }, TlsSettings());
+  TlsClient client(CreateTrustingContext(), server.GetPort());
+  EXPECT_EQ(client.ShakeHands(),
+            "The TLS handshake with localhost failed: the server ended the connection without TLS's "
+            "closing notice");
+}
+
+TEST(SSLStream, ReportsAServerThatDoesNotSpeakTls) {
+  ScriptedServer server([](ServerConnection &connection) {
+    connection.ReadRawSome();
+    connection.WriteRaw("HTTP/1.1 400 Bad Request\r\n\r\n");
+    connection.Stall();
+  });
+  TlsClient client(CreateTrustingContext(), server.GetPort());
+  EXPECT_EQ(client.ShakeHands(),
+            "The TLS handshake with localhost failed: error:0A00010B:SSL routines::wrong version number");
+}
+
+TEST(SSLStream, RefusesAServerThatOffersOnlyOldTls) {
+  TlsSettings settings;
+  settings.minimumVersion = TLS1_VERSION;
+  settings.maximumVersion = TLS1_1_VERSION;
+  settings.allowsWeakness = true;
+  ScriptedServer server(Echo, settings);
+  TlsClient client(CreateTrustingContext(), server.GetPort());
+  const std::string message = client.ShakeHands();
+  EXPECT_EQ(message.rfind("The TLS handshake with localhost failed: error:", 0), 0u) << message;
+  EXPECT_NE(message.find("alert protocol version"), std::string::npos) << message;
+}
+
+TEST(SSLStream, ABrokenRecordIsAFailure) {
+  ScriptedServer server(
+      [](ServerConnection &connection) {
+        connection.ShakeHands();
+        connection.WriteRaw(std::string("\x17\x03\x03\x00\x20", 5) + std::string(32, 'x'));
+        connection.Stall();
+      },
+      TlsSettings());
+  TlsClient client(CreateTrustingContext(), server.GetPort());
+  ASSERT_EQ(client.ShakeHands(), "");
+  const std::string message = client.Read();
+  EXPECT_EQ(message.rfind("The TLS connection to localhost broke: error:", 0), 0u) << message;
+}
+
+TEST(SSLStream, ClosingEndsAHandshakeThatStalls) {
+  ScriptedServer server([](ServerConnection &connection) { connection.Stall(); }, TlsSettings());
+  TlsClient client(CreateTrustingContext(), server.GetPort());
+  Completion shaken;
+  client.GetStream()->AsyncHandshake("localhost", "", shaken.ForEnd());
+  ASSERT_TRUE(Testing::DrainIoThreads());
+  EXPECT_EQ(shaken.GetCalls(), 0);
+  client.GetStream()->Close();
+  EXPECT_EQ(shaken.GetMessage(), "The TLS handshake with localhost failed: closed by this side");
+  ASSERT_TRUE(Testing::DrainIoThreads());
+  EXPECT_EQ(shaken.GetCalls(), 1);
+}
+
+TEST(SSLStream, ClosingEndsPendingReadsAndWritesOnce) {
+  ScriptedServer server(
+      [](ServerConnection &connection) {
+        connection.ShakeHands();
+        connection.WaitForInterrupt();
+      },
+      TlsSettings());
+  TlsClient client(CreateTrustingContext(), server.GetPort());
+  ASSERT_EQ(client.ShakeHands(), "");
+  char buffer[16];
+  const std::string message(64u << 20, 'x');
+  Completion read;
+  Completion written;
+  client.GetStream()->AsyncReadSome(buffer, sizeof buffer, read.ForTransfer());
+  client.GetStream()->AsyncWrite(message.data(), message.size(), written.ForTransfer());
+  ASSERT_TRUE(Testing::DrainIoThreads());
+  EXPECT_EQ(read.GetCalls() + written.GetCalls(), 0);
+  client.GetStream()->Close();
+  EXPECT_EQ(read.GetMessage(), "The TLS connection to localhost broke: closed by this side");
+  EXPECT_EQ(written.GetMessage(), "The TLS connection to localhost broke: closed by this side");
+  ASSERT_TRUE(Testing::DrainIoThreads());
+  EXPECT_EQ(read.GetCalls(), 1);
+  EXPECT_EQ(written.GetCalls(), 1);
+}
+
+TEST(SSLStream, LeavesNoDescriptorBehindWhateverHappens) {
+  ScriptedServer server([](ServerConnection &connection) { connection.Stall(); }, TlsSettings());
+  const Ref<SSLContext> context = CreateTrustingContext();
+  const auto attempt = [&](int i) {
+    TlsClient client(context, server.GetPort());
+    Completion shaken;
+    client.GetStream()->AsyncHandshake("localhost", i % 2 == 0 ? "bad" : "", shaken.ForEnd());
+    if (i % 2 != 0) {
+      client.GetStream()->Close();
+    }
+    EXPECT_NE(shaken.GetMessage(), "");
+  };
+  attempt(0);
+  const auto settled = [&](std::size_t limit) {
+    return Testing::Eventually([limit] { return Testing::CountDescriptors() <= limit; });
+  };
+  ASSERT_TRUE(Testing::DrainIoThreads());
+  ASSERT_TRUE(Testing::Eventually([&] { return server.GetOpenCount() == 0; }));
+  const std::size_t before = Testing::CountDescriptors();
+  const std::size_t threads = Testing::CountThreads();
+  for (int i = 0; i < 40; ++i) {
+    attempt(i);
+  }
+  EXPECT_TRUE(settled(before));
+  EXPECT_TRUE(Testing::Eventually([threads] { return Testing::CountThreads() <= threads; }));
+}
+
+TEST(SSLStream, OperationsBeforeTheHandshakeFail) {
+  ScriptedServer server(Echo, TlsSettings());
+  TlsClient client(CreateTrustingContext(), server.GetPort());
+  EXPECT_EQ(client.Read(), "The TLS handshake has not been started");
+  EXPECT_EQ(client.Write("x"), "The TLS handshake has not been started");
+  EXPECT_EQ(client.ShakeHands(), "");
+  EXPECT_EQ(client.ShakeHands(), "The TLS handshake was started before");
+  EXPECT_EQ(client.Write("x"), "");
+  EXPECT_EQ(client.Read(), "x");
+}
+
+TEST(SSLStream, ASecondReadOrWriteAtTheSameTimeIsRefused) {
+  ScriptedServer server(
+      [](ServerConnection &connection) {
+        connection.ShakeHands();
+        connection.WaitForInterrupt();
+      },
+      TlsSettings());
+  TlsClient client(CreateTrustingContext(), server.GetPort());
+  ASSERT_EQ(client.ShakeHands(), "");
+  char buffer[2];
+  Completion first;
+  Completion second;
+  client.GetStream()->AsyncReadSome(buffer, 1, first.ForTransfer());
+  client.GetStream()->AsyncReadSome(buffer + 1, 1, second.ForTransfer());
+  EXPECT_TRUE(second.FailedWith<InvalidStateException>());
+  EXPECT_EQ(first.GetCalls(), 0);
+  client.GetStream()->Close();
+  EXPECT_TRUE(first.FailedWith<SSLException>());
+}
+
+TEST(SSLStream, TheHostsErrorQueueIsNeitherReadNorChanged) {
+  ScriptedServer server(Echo, TlsSettings());
+  ERR_clear_error();
+  ERR_put_error(ERR_LIB_USER, 0, 77, "host.cpp", 1);
+  const unsigned long left = ERR_peek_error();
+  {
+    TlsClient client(CreateTrustingContext(), server.GetPort());
+    EXPECT_EQ(client.ShakeHands(), "");
+    EXPECT_EQ(client.Write("hello"), "");
+    EXPECT_EQ(client.Read(), "hello");
+    client.GetStream()->Close();
+    TlsClient refused(CreateTrustingContext(), server.GetPort());
+    EXPECT_NE(refused.ShakeHands("other.example"), "");
+  }
+  EXPECT_EQ(ERR_get_error(), left);
+  EXPECT_EQ(ERR_get_error(), 0u);
+}
+
+TEST(SSLStream, ManyConnectionsAtOnce) {
+  ScriptedServer server(Echo, TlsSettings());
+  const Ref<SSLContext> context = CreateTrustingContext();
+  std::vector<std::thread> threads;
+  std::atomic<int> right{0};
+  for (int t = 0; t < 8; ++t) {
+    threads.emplace_back([&] {
+      for (int i = 0; i < 10; ++i) {
+        TlsClient client(context, server.GetPort());
+        right += client.ShakeHands().empty() && client.Write("hello").empty() && client.Read() == "hello";
+        client.GetStream()->Close();
+      }
+    });
+  }
+  for (std::thread &thread : threads) {
+    thread.join();
+  }
+  EXPECT_EQ(right, 80);
+}
+
+} // namespace
+} // namespace Ssl
+} // namespace Tarvel

@@ -1,0 +1,432 @@
+// SPDX-License-Identifier: Apache-2.0
+
+#include <tarvel/system/stream.h>
+
+#include "support/completion.h"
+#include "support/process_resources.h"
+#include "support/scripted_server.h"
+#include "system/name_lookup.h"
+
+#include <gtest/gtest.h>
+
+#include <atomic>
+#include <chrono>
+#include <fcntl.h>
+#include <future>
+#include <netinet/in.h>
+#include <string>
+#include <sys/socket.h>
+#include <thread>
+#include <unistd.h>
+#include <vector>
+
+namespace Tarvel {
+namespace System {
+namespace {
+
+using Testing::Completion;
+using Testing::Eventually;
+using Testing::PATIENCE;
+using Testing::ScriptedServer;
+using Testing::ServerConnection;
+
+std::string Connect(const Ref<TcpClientSocket> &socket, const std::string &host, int port) {
+  Completion connected;
+  socket->AsyncConnect(host, port, connected.ForEnd());
+  return connected.GetMessage();
+}
+
+std::string Connect(const std::string &host, int port) {
+  return Connect(CreateTcpClientSocket(), host, port);
+}
+
+std::string Read(const Ref<TcpClientSocket> &socket, std::size_t length = 100) {
+  std::string bytes(length, '\0');
+  Completion read;
+  socket->AsyncReadSome(bytes.data(), bytes.size(), read.ForTransfer());
+  if (const std::string failure = read.GetMessage(); !failure.empty()) {
+    return failure;
+  }
+  bytes.resize(read.GetCount());
+  return bytes;
+}
+
+/// A port of loopback that takes no more connections: its queue is full, and nobody empties it.
+class FullPort {
+public:
+  FullPort() {
+    m_listener = ::socket(AF_INET, SOCK_STREAM | SOCK_CLOEXEC, 0);
+    sockaddr_in address{};
+    address.sin_family = AF_INET;
+    address.sin_addr.s_addr = htonl(INADDR_LOOPBACK);
+    socklen_t length = sizeof address;
+    ::bind(m_listener, reinterpret_cast<const sockaddr *>(&address), length);
+    ::listen(m_listener, 0);
+    ::getsockname(m_listener, reinterpret_cast<sockaddr *>(&address), &length);
+    m_port = ntohs(address.sin_port);
+    for (int i = 0; i < 8; ++i) {
+      const int filler = ::socket(AF_INET, SOCK_STREAM | SOCK_CLOEXEC | SOCK_NONBLOCK, 0);
+      ::connect(filler, reinterpret_cast<const sockaddr *>(&address), length);
+      m_fillers.push_back(filler);
+    }
+  }
+  FullPort(const FullPort &) = delete;
+  FullPort &operator=(const FullPort &) = delete;
+  ~FullPort() {
+    for (const int filler : m_fillers) {
+      ::close(filler);
+    }
+    ::close(m_listener);
+  }
+  int GetPort() const { return m_port; }
+
+private:
+  int m_listener = -1;
+  int m_port = 0;
+  std::vector<int> m_fillers;
+};
+
+void Echo(ServerConnection &connection) {
+  for (std::string some = connection.ReadSome(); !some.empty(); some = connection.ReadSome()) {
+    connection.Write(some);
+  }
+}
+
+TEST(TcpClientSocket, ConnectsToNamesAndAddresses) {
+  ScriptedServer server(Echo);
+  for (const char *host : {"127.0.0.1", "localhost"}) {
+    EXPECT_EQ(Connect(host, server.GetPort()), "") << host;
+  }
+}
+
+TEST(TcpClientSocket, ConnectsToIPv6WithAndWithoutBracketsAndWithScope) {
+  ScriptedServer server(Echo, std::nullopt, true);
+  for (const char *host : {"::1", "[::1]", "0:0:0:0:0:0:0:1", "::1%lo", "[::1%lo]"}) {
+    EXPECT_EQ(Connect(host, server.GetPort()), "") << host;
+  }
+}
+
+TEST(TcpClientSocket, ExchangesBytes) {
+  ScriptedServer server(Echo);
+  const Ref<TcpClientSocket> socket = CreateTcpClientSocket();
+  ASSERT_EQ(Connect(socket, "127.0.0.1", server.GetPort()), "");
+  Completion written;
+  socket->AsyncWrite("hello", 5, written.ForTransfer());
+  EXPECT_EQ(written.GetMessage(), "");
+  EXPECT_EQ(written.GetCount(), 5u);
+  EXPECT_EQ(Read(socket), "hello");
+}
+
+TEST(TcpClientSocket, WritesAllOfALargeMessage) {
+  constexpr std::size_t LENGTH = 16u << 20;
+  std::promise<std::string> received;
+  ScriptedServer server([&](ServerConnection &connection) { received.set_value(connection.ReadExactly(LENGTH)); });
+  const Ref<TcpClientSocket> socket = CreateTcpClientSocket();
+  ASSERT_EQ(Connect(socket, "127.0.0.1", server.GetPort()), "");
+  std::string message(LENGTH, 'x');
+  for (std::size_t i = 0; i < LENGTH; i += 997) {
+    message[i] = static_cast<char>('a' + i % 26);
+  }
+  Completion written;
+  socket->AsyncWrite(message.data(), message.size(), written.ForTransfer());
+  EXPECT_EQ(written.GetMessage(), "");
+  EXPECT_EQ(written.GetCount(), LENGTH);
+  EXPECT_TRUE(received.get_future().get() == message);
+}
+
+TEST(TcpClientSocket, ReadsThePeersOrderlyEndAsZeroBytes) {
+  ScriptedServer server([](ServerConnection &connection) { connection.Write("bye"); });
+  const Ref<TcpClientSocket> socket = CreateTcpClientSocket();
+  ASSERT_EQ(Connect(socket, "127.0.0.1", server.GetPort()), "");
+  EXPECT_EQ(Read(socket), "bye");
+  EXPECT_EQ(Read(socket), "");
+  EXPECT_EQ(Read(socket), "");
+}
+
+TEST(TcpClientSocket, ReportsAResetWithEndpointAndReason) {
+  std::promise<void> connected; // a reset that comes too soon makes the connect fail
+  ScriptedServer server([future = connected.get_future().share()](ServerConnection &connection) {
+    future.wait_for(PATIENCE);
+    connection.Reset();
+  });
+  const Ref<TcpClientSocket> socket = CreateTcpClientSocket();
+  ASSERT_EQ(Connect(socket, "127.0.0.1", server.GetPort()), "");
+  connected.set_value();
+  EXPECT_EQ(Read(socket),
+            "The connection to 127.0.0.1:" + std::to_string(server.GetPort()) + " broke: Connection reset by peer");
+}
+
+TEST(TcpClientSocket, ReportsARefusedConnection) {
+  const Testing::UnusedPort unused;
+  const Ref<TcpClientSocket> socket = CreateTcpClientSocket();
+  Completion connected;
+  socket->AsyncConnect("127.0.0.1", unused.GetPort(), connected.ForEnd());
+  EXPECT_EQ(connected.GetMessage(),
+            "Cannot connect to 127.0.0.1:" + std::to_string(unused.GetPort()) + ": Connection refused");
+  EXPECT_TRUE(connected.FailedWith<NetworkException>());
+}
+
+TEST(TcpClientSocket, ReportsAnUnknownHost) {
+  // RFC 6761, section 6.4: a name under "invalid" never resolves. The reason depends on whether there is a name server.
+  const std::string message = Connect("host.invalid", 443);
+  EXPECT_EQ(message.rfind("Cannot connect to host.invalid:443: ", 0), 0u) << message;
+}
+
+TEST(TcpClientSocket, ReportsTheResolversReason) {
+  const ScopedNameLookup lookup(
+      [](const std::string &) -> AddressList { throw NetworkException("Name or service not known"); });
+  EXPECT_EQ(Connect("sts.example", 443), "Cannot connect to sts.example:443: Name or service not known");
+}
+
+TEST(TcpClientSocket, ReportsANameWithoutAddress) {
+  const ScopedNameLookup lookup([](const std::string &) { return AddressList(); });
+  EXPECT_EQ(Connect("sts.example", 443), "Cannot connect to sts.example:443: The name has no address");
+}
+
+TEST(TcpClientSocket, RefusesHostsAndPortsThatCannotBe) {
+  struct Case {
+    std::string host;
+    int port;
+    std::string reason;
+  };
+  const std::string notAscii = "the host name is not ASCII (an internationalised name must be in its \"xn--\" form)";
+  const std::string control = "the host name holds a blank or a control character";
+  const std::string port = "the port is not between 1 and 65535";
+  for (const Case &bad : std::vector<Case>{{"", 1, "the host name is empty"},
+                                           {"b\xC3\xBC"
+                                            "cher.example",
+                                            1, notAscii},
+                                           {"a b", 1, control},
+                                           {"a\r\n", 1, control},
+                                           {"a", 0, port},
+                                           {"a", -1, port},
+                                           {"a", 65536, port},
+                                           {"[a.example]", 1, "only an IPv6 address may stand in brackets"}}) {
+    EXPECT_EQ(Connect(bad.host, bad.port),
+              "Cannot connect to " + bad.host + ":" + std::to_string(bad.port) + ": " + bad.reason);
+  }
+}
+
+TEST(TcpClientSocket, RefusesAHostThatHoldsAZero) {
+  const Ref<TcpClientSocket> socket = CreateTcpClientSocket();
+  Completion connected;
+  socket->AsyncConnect(std::string("localhost\0.example", 18), 1, connected.ForEnd());
+  EXPECT_TRUE(connected.FailedWith<NetworkException>());
+}
+
+TEST(TcpClientSocket, TriesTheNextAddressOfTheName) {
+  ScriptedServer server(Echo);
+  const ScopedNameLookup lookup([](const std::string &) {
+    return AddressList{boost::asio::ip::make_address("::1"), boost::asio::ip::make_address("127.0.0.1")};
+  });
+  const Ref<TcpClientSocket> socket = CreateTcpClientSocket();
+  EXPECT_EQ(Connect(socket, "two.example", server.GetPort()), "");
+  Completion written;
+  socket->AsyncWrite("x", 1, written.ForTransfer());
+  EXPECT_EQ(Read(socket), "x");
+}
+
+TEST(TcpClientSocket, ReportsEachAddressThatFailed) {
+  const Testing::UnusedPort unused;
+  const ScopedNameLookup lookup([](const std::string &) {
+    return AddressList{boost::asio::ip::make_address("::1"), boost::asio::ip::make_address("127.0.0.1")};
+  });
+  EXPECT_EQ(Connect("two.example", unused.GetPort()),
+            "Cannot connect to two.example:" + std::to_string(unused.GetPort()) +
+                ": ::1: Connection refused; 127.0.0.1: Connection refused");
+}
+
+TEST(TcpClientSocket, ClosingEndsAConnectThatNobodyAnswers) {
+  const FullPort full;
+  const Ref<TcpClientSocket> socket = CreateTcpClientSocket();
+  ASSERT_TRUE(Testing::DrainIoThreads());
+  const std::size_t descriptors = Testing::CountDescriptors();
+  Completion connected;
+  socket->AsyncConnect("127.0.0.1", full.GetPort(), connected.ForEnd());
+  const Ref<ScheduledItem> canceller = CreateStreamCanceller(socket);
+  ASSERT_TRUE(Testing::DrainIoThreads());
+  ASSERT_EQ(connected.GetCalls(), 0);
+  EXPECT_FALSE(canceller->IsDone());
+  canceller->Cancel();
+  canceller->Cancel();
+  EXPECT_EQ(connected.GetMessage(), "Cannot connect to 127.0.0.1:" + std::to_string(full.GetPort()) + ": cancelled");
+  EXPECT_TRUE(canceller->IsDone());
+  ASSERT_TRUE(Testing::DrainIoThreads());
+  EXPECT_EQ(connected.GetCalls(), 1);
+  EXPECT_EQ(Testing::CountDescriptors(), descriptors);
+}
+
+TEST(TcpClientSocket, ClosingDoesNotWaitForALookupThatHangs) {
+  std::promise<void> promise;
+  const std::shared_future<void> answer = promise.get_future().share();
+  std::atomic<int> running{0};
+  {
+    const ScopedNameLookup lookup([&running, answer](const std::string &) -> AddressList {
+      ++running;
+      answer.wait_for(PATIENCE);
+      --running;
+      throw NetworkException("too late");
+    });
+    const Ref<TcpClientSocket> socket = CreateTcpClientSocket();
+    Completion connected;
+    socket->AsyncConnect("hangs.example", 443, connected.ForEnd());
+    ASSERT_TRUE(Eventually([&] { return running == 1; }));
+    socket->Close();
+    EXPECT_EQ(connected.GetMessage(), "Cannot connect to hangs.example:443: cancelled");
+    EXPECT_EQ(running, 1);
+    promise.set_value();
+    ASSERT_TRUE(Eventually([&] { return running == 0; }));
+    ASSERT_TRUE(Testing::DrainIoThreads());
+    EXPECT_EQ(connected.GetCalls(), 1);
+  }
+}
+
+TEST(TcpClientSocket, OneLookupThatHangsHoldsUpNoOther) {
+  ScriptedServer server(Echo);
+  std::promise<void> promise;
+  const std::shared_future<void> answer = promise.get_future().share();
+  std::atomic<int> running{0};
+  const ScopedNameLookup lookup([&running, answer](const std::string &host) -> AddressList {
+    if (host == "hangs.example") {
+      ++running;
+      answer.wait_for(PATIENCE);
+      --running;
+    }
+    return {boost::asio::ip::make_address("127.0.0.1")};
+  });
+  std::vector<Ref<TcpClientSocket>> hanging;
+  for (int i = 0; i < 10; ++i) {
+    hanging.push_back(CreateTcpClientSocket());
+    hanging.back()->AsyncConnect("hangs.example", server.GetPort(), [](const Exception *) {});
+  }
+  EXPECT_EQ(Connect("answers.example", server.GetPort()), "");
+  promise.set_value();
+  ASSERT_TRUE(Eventually([&] { return running == 0; }));
+}
+
+TEST(TcpClientSocket, ClosingEndsAPendingRead) {
+  ScriptedServer server([](ServerConnection &connection) { connection.Stall(); });
+  const Ref<TcpClientSocket> socket = CreateTcpClientSocket();
+  ASSERT_EQ(Connect(socket, "127.0.0.1", server.GetPort()), "");
+  char buffer[16];
+  Completion read;
+  socket->AsyncReadSome(buffer, sizeof buffer, read.ForTransfer());
+  socket->Close();
+  EXPECT_EQ(read.GetMessage(),
+            "The connection to 127.0.0.1:" + std::to_string(server.GetPort()) + " was closed by this side");
+  EXPECT_TRUE(read.FailedWith<NetworkException>());
+  ASSERT_TRUE(Testing::DrainIoThreads());
+  EXPECT_EQ(read.GetCalls(), 1);
+}
+
+TEST(TcpClientSocket, ClosingEndsAWriteThatThePeerDoesNotTake) {
+  std::promise<void> done;
+  ScriptedServer server([future = done.get_future().share()](ServerConnection &) { future.wait_for(PATIENCE); });
+  const Ref<TcpClientSocket> socket = CreateTcpClientSocket();
+  ASSERT_EQ(Connect(socket, "127.0.0.1", server.GetPort()), "");
+  const std::string message(64u << 20, 'x');
+  Completion written;
+  socket->AsyncWrite(message.data(), message.size(), written.ForTransfer());
+  ASSERT_TRUE(Testing::DrainIoThreads());
+  ASSERT_EQ(written.GetCalls(), 0);
+  socket->Close();
+  EXPECT_TRUE(written.FailedWith<NetworkException>());
+  ASSERT_TRUE(Testing::DrainIoThreads());
+  EXPECT_EQ(written.GetCalls(), 1);
+  done.set_value();
+}
+
+TEST(TcpClientSocket, OperationsWithoutAConnectionFail) {
+  const Ref<TcpClientSocket> socket = CreateTcpClientSocket();
+  EXPECT_EQ(Read(socket), "There is no connection");
+  Completion written;
+  socket->AsyncWrite("x", 1, written.ForTransfer());
+  EXPECT_EQ(written.GetMessage(), "There is no connection");
+  socket->Close();
+  EXPECT_EQ(Connect(socket, "127.0.0.1", 1), "The socket has been used or closed already");
+}
+
+TEST(TcpClientSocket, HandlersNeverRunInsideTheStartingCall) {
+  ScriptedServer server(Echo);
+  const std::thread::id self = std::this_thread::get_id();
+  std::vector<std::promise<bool>> elsewhere(3);
+  const auto note = [&](std::size_t i) { elsewhere[i].set_value(std::this_thread::get_id() != self); };
+  const Ref<TcpClientSocket> socket = CreateTcpClientSocket();
+  char buffer[1];
+  socket->AsyncReadSome(buffer, 1, [&](std::size_t, const Exception *) { note(0); });
+  socket->AsyncConnect("", 0, [&](const Exception *) { note(1); });
+  const Ref<TcpClientSocket> other = CreateTcpClientSocket();
+  other->AsyncConnect("127.0.0.1", server.GetPort(), [&](const Exception *) { note(2); });
+  for (std::promise<bool> &promise : elsewhere) {
+    EXPECT_TRUE(promise.get_future().get());
+  }
+}
+
+TEST(TcpClientSocket, AHandlerThatThrowsHarmsNobody) {
+  ScriptedServer server(Echo);
+  for (int i = 0; i < 10; ++i) {
+    CreateTcpClientSocket()->AsyncConnect("127.0.0.1", server.GetPort(), [](const Exception *) { throw 1; });
+  }
+  EXPECT_EQ(Connect("127.0.0.1", server.GetPort()), "");
+}
+
+TEST(TcpClientSocket, ADescriptorIsNotInherited) {
+  ScriptedServer server([](ServerConnection &connection) { connection.Stall(); });
+  const Ref<TcpClientSocket> socket = CreateTcpClientSocket();
+  ASSERT_EQ(Connect(socket, "127.0.0.1", server.GetPort()), "");
+  int sockets = 0;
+  for (int descriptor = 3; descriptor < 256; ++descriptor) {
+    sockaddr_in peer{};
+    socklen_t length = sizeof peer;
+    if (::getpeername(descriptor, reinterpret_cast<sockaddr *>(&peer), &length) == 0 &&
+        ntohs(peer.sin_port) == server.GetPort()) {
+      ++sockets;
+      EXPECT_NE(::fcntl(descriptor, F_GETFD) & FD_CLOEXEC, 0);
+    }
+  }
+  EXPECT_EQ(sockets, 1);
+}
+
+TEST(TcpClientSocket, LeavesNoDescriptorAndNoThreadBehind) {
+  ScriptedServer server([](ServerConnection &connection) { connection.Stall(); });
+  ASSERT_EQ(Connect("localhost", server.GetPort()), ""); // starts the I/O threads
+  ASSERT_TRUE(Testing::DrainIoThreads());
+  std::vector<Ref<TcpClientSocket>> sockets;
+  const std::size_t threads = Testing::CountThreads();
+  for (int round = 0; round < 2; ++round) {
+    for (int i = 0; i < 50; ++i) {
+      sockets.push_back(CreateTcpClientSocket());
+      sockets.back()->AsyncConnect(i % 2 == 0 ? "localhost" : "127.0.0.1", server.GetPort(), [](const Exception *) {});
+      if (i % 3 == 0) {
+        sockets.back()->Close();
+      }
+    }
+    sockets.clear();
+  }
+  ASSERT_EQ(Connect("localhost", server.GetPort()), "");
+  const auto descriptorsLeft = [&] {
+    int count = 0;
+    for (int descriptor = 3; descriptor < 1024; ++descriptor) {
+      sockaddr_in peer{};
+      socklen_t length = sizeof peer;
+      count += ::getpeername(descriptor, reinterpret_cast<sockaddr *>(&peer), &length) == 0 &&
+               ntohs(peer.sin_port) == server.GetPort();
+    }
+    return count;
+  };
+  EXPECT_TRUE(Eventually([&] { return descriptorsLeft() == 0; }));
+  EXPECT_TRUE(Eventually([&] { return Testing::CountThreads() <= threads; }));
+}
+
+TEST(StreamCanceller, IsDoneOnceTheConnectHasEnded) {
+  ScriptedServer server(Echo);
+  const Ref<TcpClientSocket> socket = CreateTcpClientSocket();
+  const Ref<ScheduledItem> canceller = CreateStreamCanceller(socket);
+  EXPECT_FALSE(canceller->IsDone());
+  ASSERT_EQ(Connect(socket, "127.0.0.1", server.GetPort()), "");
+  EXPECT_TRUE(canceller->IsDone());
+}
+
+} // namespace
+} // namespace System
+} // namespace Tarvel
