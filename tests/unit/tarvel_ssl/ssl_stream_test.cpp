@@ -161,8 +161,9 @@ TEST(SSLStream, ReportsAResetBeforeTheHandshake) {
       TlsSettings());
   TlsClient client(CreateTrustingContext(), server.GetPort());
   connected.set_value();
+  // The kernel tells a reset once: if the write meets it, the read that runs beside it sees an end.
   const std::string message = client.ShakeHands();
-  EXPECT_EQ(message.rfind("The TLS handshake with localhost failed: The connection to 127.0.0.1:", 0), 0u) << message;
+  EXPECT_EQ(message.rfind("The TLS handshake with localhost failed: ", 0), 0u) << message;
   EXPECT_TRUE(client.FailedInHandshake());
 }
 
