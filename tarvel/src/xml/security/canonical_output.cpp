@@ -84,7 +84,7 @@ void CanonicalOutput::Flush() {
 void CanonicalOutput::PutPastBuffer(std::string_view octets) {
   Flush();
   if (octets.size() < m_buffer.size()) {
-    std::memcpy(m_buffer.data(), octets.data(), octets.size());
+    octets.copy(m_buffer.data(), octets.size());
     m_used = octets.size();
     return;
   }

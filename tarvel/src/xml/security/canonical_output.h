@@ -8,7 +8,6 @@
 
 #include <array>
 #include <cstddef>
-#include <cstring>
 #include <string_view>
 
 namespace Tarvel::Xml::Security {
@@ -26,7 +25,7 @@ public:
       PutPastBuffer(octets);
       return;
     }
-    std::memcpy(m_buffer.data() + m_used, octets.data(), octets.size());
+    octets.copy(m_buffer.data() + m_used, octets.size());
     m_used += octets.size();
   }
 
