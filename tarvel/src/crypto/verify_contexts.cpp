@@ -32,7 +32,7 @@ void VerifyContexts::Put(SignatureScheme scheme, DigestAlgorithm algorithm, KeyC
   for (std::atomic<EVP_PKEY_CTX *> &slot : GetSlots(scheme, algorithm)) {
     EVP_PKEY_CTX *expected = nullptr;
     if (slot.compare_exchange_strong(expected, context.get(), std::memory_order_release, std::memory_order_relaxed)) {
-      context.release();
+      static_cast<void>(context.release()); // the slot owns it now
       return;
     }
   }

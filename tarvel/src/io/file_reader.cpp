@@ -50,6 +50,7 @@ public:
 int OpenForReading(const std::string &path) {
   // A path is a C string to the system: what follows a NUL would be dropped without a word.
   if (path.find('\0') != std::string::npos) {
+    // NOLINTNEXTLINE(readability-redundant-string-cstr): the message shows the path up to its NUL.
     ThrowFor("open", path.c_str(), EINVAL);
   }
   for (;;) {
