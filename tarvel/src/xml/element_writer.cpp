@@ -4,7 +4,10 @@
 
 #include <tarvel/core/secure_wipe.h>
 
+#include <array>
+#include <cstddef>
 #include <string>
+#include <string_view>
 
 namespace Tarvel {
 namespace Xml {
@@ -12,6 +15,33 @@ namespace Xml {
 namespace {
 
 constexpr std::size_t FLUSH_BYTES = 8 * 1024;
+
+/// A set of characters, asked for each byte that is written.
+class CharacterSet {
+public:
+  constexpr explicit CharacterSet(std::string_view characters) {
+    for (const char character : characters) {
+      m_contains[static_cast<unsigned char>(character)] = true;
+    }
+  }
+
+  /// The offset of the first character of `text` that is in the set, or the text's size.
+  std::size_t FindIn(std::string_view text) const noexcept {
+    std::size_t offset = 0;
+    while (offset < text.size() && !m_contains[static_cast<unsigned char>(text[offset])]) {
+      ++offset;
+    }
+    return offset;
+  }
+
+private:
+  std::array<bool, 256> m_contains{};
+};
+
+// A parser turns a carriage return into a line feed and, in attribute values, all white space into blanks. A ">" may not
+// follow "]]" in text.
+constexpr CharacterSet SPECIAL_IN_TEXT("&<>\r");
+constexpr CharacterSet SPECIAL_IN_ATTRIBUTES("&<\"\t\n\r");
 
 /// Gathers the pieces of markup, so that the writer is called for larger ones. The buffer never grows, so that no copy of
 /// a text that may be secret is left behind in the heap.
@@ -35,10 +65,10 @@ public:
   }
 
   /// Writes `text`, each of the characters in `special` as the reference that stands for it.
-  void WriteEscaped(std::string_view text, const char *special) {
+  void WriteEscaped(std::string_view text, const CharacterSet &special) {
     for (;;) {
-      const std::size_t next = text.find_first_of(special);
-      if (next == std::string_view::npos) {
+      const std::size_t next = special.FindIn(text);
+      if (next == text.size()) {
         *this << text;
         return;
       }
@@ -75,11 +105,6 @@ private:
   Writer &m_writer;
   std::string m_buffer;
 };
-
-// A parser turns a carriage return into a line feed and, in attribute values, all white space into blanks. A ">" may not
-// follow "]]" in text.
-constexpr char SPECIAL_IN_TEXT[] = "&<>\r";
-constexpr char SPECIAL_IN_ATTRIBUTES[] = "&<\"\t\n\r";
 
 void WriteStartTag(const ElementNode &element, MarkupOutput &output) {
   output << "<" << element.GetName();
