@@ -54,17 +54,17 @@ private:
 
 } // namespace
 
-XMLBuilderPtr ElementBuilder(const std::string &prefix, const std::string &name, const XMLAttributes &attributes) {
-  return std::make_shared<const ElementBuilderImpl>(prefix, name, attributes);
+XMLBuilderPtr ElementBuilder(const std::string &prefix, const std::string &name, XMLAttributes attributes) {
+  return std::make_shared<const ElementBuilderImpl>(prefix, name, std::move(attributes));
 }
 
 XMLBuilderPtr ElementBuilder(const std::string &prefix, const std::string &name) {
   return ElementBuilder(prefix, name, XMLAttributes());
 }
 
-XMLBuilderPtr TextElementBuilder(const std::string &prefix, const std::string &name, const XMLAttributes &attributes,
+XMLBuilderPtr TextElementBuilder(const std::string &prefix, const std::string &name, XMLAttributes attributes,
                                  const std::string &text) {
-  return std::make_shared<const TextElementBuilderImpl>(prefix, name, attributes, text);
+  return std::make_shared<const TextElementBuilderImpl>(prefix, name, std::move(attributes), text);
 }
 
 XMLBuilderPtr TextElementBuilder(const std::string &prefix, const std::string &name, const std::string &text) {

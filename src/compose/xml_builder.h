@@ -36,12 +36,12 @@ using XMLBuilderPtr = std::shared_ptr<const XMLBaseBuilder>;
 using XMLAttributes = std::map<std::string, std::string>;
 
 /// An element without content.
-XMLBuilderPtr ElementBuilder(const std::string &prefix, const std::string &name, const XMLAttributes &attributes);
+XMLBuilderPtr ElementBuilder(const std::string &prefix, const std::string &name, XMLAttributes attributes);
 XMLBuilderPtr ElementBuilder(const std::string &prefix, const std::string &name);
 
 /// An element whose only child is a text node, also when `text` is empty. The text is given unescaped, and is wiped when
 /// the builder goes, since it may be a password.
-XMLBuilderPtr TextElementBuilder(const std::string &prefix, const std::string &name, const XMLAttributes &attributes,
+XMLBuilderPtr TextElementBuilder(const std::string &prefix, const std::string &name, XMLAttributes attributes,
                                  const std::string &text);
 XMLBuilderPtr TextElementBuilder(const std::string &prefix, const std::string &name, const std::string &text);
 

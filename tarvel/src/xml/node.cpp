@@ -181,7 +181,10 @@ void ElementNode::DefineAttribute(std::string_view qualifiedName, std::string_vi
     throw InvalidArgumentException("the attribute name '" + std::string(qualifiedName) +
                                    "' is not a qualified XML name");
   }
-  RequireXmlText("the value of the attribute '" + std::string(qualifiedName) + "'", value);
+  const std::string refusal = DescribeForbiddenCharacter("", value);
+  if (!refusal.empty()) {
+    throw InvalidArgumentException("the value of the attribute '" + std::string(qualifiedName) + "'" + refusal);
+  }
   for (Attribute *attribute = m_firstAttribute; attribute; attribute = attribute->m_next) {
     if (attribute->m_name == qualifiedName) {
       attribute->m_value = m_arena->Copy(value);
