@@ -19,6 +19,11 @@ struct XmlDocDeleter {
 };
 using XmlDocHandle = std::unique_ptr<xmlDoc, XmlDocDeleter>;
 
+/// A text as libxml2 wants it.
+inline const xmlChar *XmlText(const char *text) noexcept {
+  return reinterpret_cast<const xmlChar *>(text);
+}
+
 /// Null when the text is not well-formed. Prints nothing.
 XmlDocHandle ParseWithLibxml2(std::string_view text);
 

@@ -24,7 +24,7 @@ struct ContextDeleter {
 using ContextHandle = std::unique_ptr<EVP_MD_CTX, ContextDeleter>;
 
 std::string AttributeOf(xmlNode *node, const char *name) {
-  xmlChar *const value = node ? xmlGetNoNsProp(node, BAD_CAST name) : nullptr;
+  xmlChar *const value = node ? xmlGetNoNsProp(node, XmlText(name)) : nullptr;
   const std::string copy = value ? reinterpret_cast<const char *>(value) : "";
   xmlFree(value);
   return copy;
@@ -104,7 +104,7 @@ XmlDocHandle PssOracle::WithFreshDigests(const xmlDoc &document) const {
   if (!method) {
     return nullptr;
   }
-  xmlSetProp(method, BAD_CAST "Algorithm", BAD_CAST HELPER_ALGORITHM);
+  xmlSetProp(method, XmlText("Algorithm"), XmlText(HELPER_ALGORITHM));
   return SignWithXmlSec(*copy, *m_helperKey) ? std::move(copy) : nullptr;
 }
 
@@ -116,7 +116,7 @@ bool PssOracle::Sign(xmlDoc &document) const {
   const std::vector<xmlNode *> values = DigestValues(document);
   const std::vector<xmlNode *> freshValues = DigestValues(*fresh);
   for (std::size_t index = 0; index < values.size(); ++index) {
-    xmlNodeSetContent(values[index], BAD_CAST TextOf(freshValues[index]).c_str());
+    xmlNodeSetContent(values[index], XmlText(TextOf(freshValues[index]).c_str()));
   }
   const std::string canonical = CanonicalSignedInfo(document).value();
   const ContextHandle context(EVP_MD_CTX_new());

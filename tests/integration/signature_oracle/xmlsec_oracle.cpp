@@ -43,7 +43,7 @@ ContextHandle NewContext(const xmlSecKey &key) {
 
 /// The signature element, in a document whose identifiers are known to libxml2.
 xmlNode *PrepareSignature(xmlDoc &document) {
-  const xmlChar *identifiers[] = {BAD_CAST "ID", BAD_CAST "Id", nullptr};
+  const xmlChar *identifiers[] = {XmlText("ID"), XmlText("Id"), nullptr};
   xmlSecAddIDs(&document, xmlDocGetRootElement(&document), identifiers);
   return ElementOfLibxml2(document, "Signature");
 }

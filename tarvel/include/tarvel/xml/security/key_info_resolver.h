@@ -29,8 +29,9 @@ protected:
 };
 
 /// A resolver over a fixed set of trusted certificates. Trust is in the key: validity dates, names and extensions of a
-/// trusted certificate are not judged. A `KeyInfo` that holds one of the certificates, byte for byte, selects that one;
-/// every other `KeyInfo`, and none, leaves the whole set.
+/// trusted certificate are not judged. A `KeyInfo` whose X509Data holds one of the certificates, byte for byte, selects that
+/// one, and one that holds several selects these; every other `KeyInfo`, and none, leaves the whole set. Its first 16
+/// certificates are compared. Null references in `trusted` are passed over, equal certificates count once.
 TARVEL_API Ref<KeyInfoResolver> CreateTrustSetKeyResolver(const KeyInfoResolver::CertificateList &trusted);
 
 } // namespace Security
