@@ -2,11 +2,11 @@
 
 #include "system/tcp_client_socket.h"
 
+#include "system/endless_thread_pool.h"
 #include "system/io_engine.h"
 #include "system/uncaught_exception.h"
 
 #include <tarvel/core/exception.h>
-#include <tarvel/system/thread_pool.h>
 
 #include <boost/asio/buffer.hpp>
 #include <boost/asio/error.hpp>
@@ -33,7 +33,7 @@ constexpr std::chrono::milliseconds LOOKUP_IDLE_TIME{500};
 
 ThreadPool &LookupPool() {
   // Never destroyed, as nobody can end a lookup.
-  static ThreadPool *const pool = CreateThreadPool(MAX_LOOKUP_THREADS, LOOKUP_IDLE_TIME).Detach();
+  static ThreadPool *const pool = CreateEndlessThreadPool(MAX_LOOKUP_THREADS, LOOKUP_IDLE_TIME).Detach();
   return *pool;
 }
 
@@ -244,12 +244,27 @@ void TcpClientSocketImpl::AsyncReadSome(char *buffer, std::size_t length, Transf
     PostTransferFailure(std::move(handler), InvalidArgumentException("a read of no bytes"));
     return;
   }
+  if (m_readEnd) {
+    asio::post(GetIoContext(), [self = Ref(this), handler = std::move(handler), error = m_readEnd] {
+      self->CompleteRead(handler, error, 0);
+    });
+    return;
+  }
   m_socket.async_read_some(asio::buffer(buffer, length),
                            [self = Ref(this), handler = std::move(handler)](
                                const error_code &error, std::size_t count) { self->OnRead(handler, error, count); });
 }
 
 void TcpClientSocketImpl::OnRead(const TransferHandler &handler, const error_code &error, std::size_t count) {
+  if (error) {
+    const std::lock_guard<std::mutex> lock(m_mutex);
+    m_readEnd = error;
+  }
+  CompleteRead(handler, error, count);
+}
+
+void TcpClientSocketImpl::CompleteRead(const TransferHandler &handler, const error_code &error,
+                                       std::size_t count) const {
   if (!error || error == asio::error::eof) {
     handler(count, nullptr);
     return;
@@ -262,6 +277,10 @@ void TcpClientSocketImpl::AsyncWrite(const char *bytes, std::size_t length, Tran
   const std::lock_guard<std::mutex> lock(m_mutex);
   if (m_stage != Stage::CONNECTED) {
     PostTransferFailure(std::move(handler), DescribeTransferFailure(asio::error::not_connected));
+    return;
+  }
+  if (m_writeEnd) {
+    PostTransferFailure(std::move(handler), DescribeTransferFailure(m_writeEnd));
     return;
   }
   WriteSome(std::make_unique<PendingWrite>(PendingWrite{bytes, length, 0, std::move(handler)}));
@@ -288,6 +307,7 @@ void TcpClientSocketImpl::OnWritten(std::unique_ptr<PendingWrite> pending, const
       }
       result = asio::error::operation_aborted;
     }
+    m_writeEnd = result;
   }
   if (!result) {
     pending->handler(pending->written, nullptr);

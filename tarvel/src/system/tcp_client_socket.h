@@ -47,6 +47,7 @@ private:
   void WriteSome(std::unique_ptr<PendingWrite> pending);
   void OnWritten(std::unique_ptr<PendingWrite> pending, const boost::system::error_code &error, std::size_t count);
   void OnRead(const TransferHandler &handler, const boost::system::error_code &error, std::size_t count);
+  void CompleteRead(const TransferHandler &handler, const boost::system::error_code &error, std::size_t count) const;
 
   NetworkException DescribeTransferFailure(const boost::system::error_code &error) const;
 
@@ -55,6 +56,10 @@ private:
   Stage m_stage = Stage::FRESH;
   std::string m_target; // "host:port", for messages; set once
   int m_port = 0;
+
+  // How reading and writing ended: Asio may wait for ever when it is asked again.
+  boost::system::error_code m_readEnd;
+  boost::system::error_code m_writeEnd;
 
   // While connecting.
   ConnectHandler m_connectHandler;

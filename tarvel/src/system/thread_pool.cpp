@@ -3,6 +3,7 @@
 #include <tarvel/system/thread_pool.h>
 
 #include "system/background_thread.h"
+#include "system/endless_thread_pool.h"
 #include "system/uncaught_exception.h"
 
 #include <tarvel/core/exception.h>
@@ -22,16 +23,19 @@ namespace System {
 
 namespace {
 
+constexpr std::chrono::seconds DEFAULT_IDLE_TIME{10};
+
 class WorkItem;
 using WorkQueue = std::list<Ref<WorkItem>>;
 
 /// What the pool object, its threads and its items share; it lives as long as the last of them.
 struct PoolState {
-  PoolState(std::size_t threadCeiling, std::chrono::milliseconds threadIdleTime)
-      : ceiling(threadCeiling), idleTime(threadIdleTime) {}
+  PoolState(std::size_t threadCeiling, std::chrono::milliseconds threadIdleTime, bool isEndlessPool)
+      : ceiling(threadCeiling), idleTime(threadIdleTime), isEndless(isEndlessPool) {}
 
   const std::size_t ceiling;
   const std::chrono::milliseconds idleTime;
+  const bool isEndless;
 
   std::mutex mutex; // guards all that follows
   std::condition_variable changed;
@@ -109,6 +113,11 @@ Ref<WorkItem> WaitForWork(PoolState &pool, std::unique_lock<std::mutex> &lock) {
 /// Takes the calling thread off the pool's list, and joins those that retired before it.
 void Retire(PoolState &pool, std::list<std::thread>::iterator self, std::unique_lock<std::mutex> &lock) {
   std::list<std::thread> earlier;
+  if (pool.isEndless) {
+    self->detach();
+    pool.threads.erase(self);
+    return;
+  }
   earlier.swap(pool.retired);
   pool.retired.splice(pool.retired.end(), pool.threads, self);
   lock.unlock();
@@ -144,8 +153,8 @@ void AddThread(const std::shared_ptr<PoolState> &pool) {
 
 class ThreadPoolImpl final : public ThreadPool {
 public:
-  ThreadPoolImpl(std::size_t threadCeiling, std::chrono::milliseconds idleTime)
-      : m_state(std::make_shared<PoolState>(std::max<std::size_t>(threadCeiling, 1), idleTime)) {}
+  ThreadPoolImpl(std::size_t threadCeiling, std::chrono::milliseconds idleTime, bool isEndless)
+      : m_state(std::make_shared<PoolState>(std::max<std::size_t>(threadCeiling, 1), idleTime, isEndless)) {}
 
   Ref<ScheduledItem> QueueWorkItem(std::function<void()> work) override {
     const Ref<WorkItem> item = MakeRef<WorkItem>(m_state, std::move(work));
@@ -214,12 +223,16 @@ ThreadPool::~ThreadPool() = default;
 
 Ref<ThreadPool> GetThreadPool() {
   // Never destroyed: its threads run past the end of static objects, and nobody waits for them.
-  static ThreadPool *const pool = CreateThreadPool(DEFAULT_THREAD_CEILING).Detach();
+  static ThreadPool *const pool = CreateEndlessThreadPool(DEFAULT_THREAD_CEILING, DEFAULT_IDLE_TIME).Detach();
   return Ref<ThreadPool>(pool);
 }
 
 Ref<ThreadPool> CreateThreadPool(std::size_t threadCeiling, std::chrono::milliseconds idleTime) {
-  return MakeRef<ThreadPoolImpl>(threadCeiling, idleTime);
+  return MakeRef<ThreadPoolImpl>(threadCeiling, idleTime, false);
+}
+
+Ref<ThreadPool> CreateEndlessThreadPool(std::size_t threadCeiling, std::chrono::milliseconds idleTime) {
+  return MakeRef<ThreadPoolImpl>(threadCeiling, idleTime, true);
 }
 
 } // namespace System
