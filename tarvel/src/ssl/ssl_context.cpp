@@ -8,6 +8,8 @@
 #include "ssl/ssl_context_impl.h"
 #include "ssl/ssl_stream_impl.h"
 
+#include <openssl/x509v3.h>
+
 #include <filesystem>
 #include <system_error>
 
@@ -25,6 +27,14 @@ void RequireSuccess(long result, const Crypto::OpenSslErrorScope &errors, const 
   if (result != 1) {
     errors.Throw(failure);
   }
+}
+
+/// OpenSSL's certificate behind `certificate`, ready to be used by many connections at once: OpenSSL decodes the
+/// extensions when they are first asked for, which is better done before there is anyone to wait for it.
+X509 *Prepare(const Crypto::Certificate &certificate) {
+  X509 *const native = Crypto::AsImpl(certificate).GetNative();
+  X509_check_purpose(native, -1, 0); // what it says of bad extensions, verification will say again
+  return native;
 }
 
 } // namespace
@@ -83,8 +93,7 @@ void SSLContextImpl::TrustCertificates(const Crypto::CertificateList &certificat
   m_sessions.Clear();
   X509_STORE *const store = SSL_CTX_get_cert_store(m_native.get());
   for (const Ref<const Crypto::Certificate> &certificate : certificates) {
-    RequireSuccess(X509_STORE_add_cert(store, Crypto::AsImpl(*certificate).GetNative()), errors,
-                   "Cannot trust a certificate");
+    RequireSuccess(X509_STORE_add_cert(store, Prepare(*certificate)), errors, "Cannot trust a certificate");
   }
 }
 
@@ -95,13 +104,12 @@ void SSLContextImpl::SetClientCertificate(const Ref<const Crypto::Certificate> &
   const Crypto::OpenSslErrorScope errors;
   m_sessions.Clear();
   SSL_CTX *const native = m_native.get();
-  RequireSuccess(SSL_CTX_use_certificate(native, Crypto::AsImpl(*certificate).GetNative()), errors,
-                 "Cannot use the client certificate");
+  RequireSuccess(SSL_CTX_use_certificate(native, Prepare(*certificate)), errors, "Cannot use the client certificate");
   RequireSuccess(SSL_CTX_use_PrivateKey(native, Crypto::AsImpl(*key).GetNative()), errors,
                  "Cannot use the client certificate's key");
   SSL_CTX_clear_chain_certs(native);
   for (const Ref<const Crypto::Certificate> &intermediate : intermediates) {
-    RequireSuccess(SSL_CTX_add1_chain_cert(native, Crypto::AsImpl(*intermediate).GetNative()), errors,
+    RequireSuccess(SSL_CTX_add1_chain_cert(native, Prepare(*intermediate)), errors,
                    "Cannot use a certificate above the client's");
   }
 }
