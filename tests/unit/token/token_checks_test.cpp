@@ -1,0 +1,227 @@
+// SPDX-License-Identifier: Apache-2.0
+#include "token/token_checks.h"
+
+#include "support/throws_message.h"
+
+#include <ssoclient/exceptions.h>
+#include <tarvel/system/environment.h>
+
+#include <gtest/gtest.h>
+
+#include <cstdint>
+#include <limits>
+#include <string>
+
+namespace {
+
+using namespace SsoClient;
+using Tarvel::System::DateTime;
+using Tarvel::System::DateTimeFromUtc;
+
+constexpr std::int64_t SECOND = 1'000'000;
+constexpr std::int64_t TOLERANCE_SEC = 600;
+constexpr std::int64_t SMALLEST = std::numeric_limits<std::int64_t>::min();
+constexpr std::int64_t LARGEST = std::numeric_limits<std::int64_t>::max();
+
+const NameIDType GATEWAY{"urn:format", "gateway@corp"};
+const NameIDType BACKUP{"urn:format", "backup@corp"};
+
+class CheckTokenPropertiesTest : public ::testing::Test {
+protected:
+  static DateTime AtSecond(std::int64_t second) { return DateTimeFromUtc(m_now + second * SECOND, false); }
+
+  /// A bearer token that is valid from an hour ago for two hours.
+  static SamlAssertionType Good() {
+    SamlAssertionType assertion;
+    assertion.Version = "2.0";
+    assertion.ID = "_1";
+    assertion.Conditions.NotBefore = AtSecond(-3600);
+    assertion.Conditions.NotOnOrAfter = AtSecond(3600);
+    assertion.Subject.SubjectConfirmation.SubjectConfirmationData.NotOnOrAfter = AtSecond(3600);
+    return assertion;
+  }
+
+  static SamlAssertionType HolderOfKey() {
+    SamlAssertionType assertion = Good();
+    assertion.Subject.SubjectConfirmation.Method = SamlToken::HOLDER_OF_KEY;
+    return assertion;
+  }
+
+  /// A holder-of-key token, whose end no rule but its own looks at.
+  static SamlAssertionType ValidBetween(std::int64_t from, std::int64_t to) {
+    SamlAssertionType assertion = HolderOfKey();
+    assertion.Conditions.NotBefore = AtSecond(from);
+    assertion.Conditions.NotOnOrAfter = AtSecond(to);
+    return assertion;
+  }
+
+  static void Check(const SamlAssertionType &assertion) { CheckTokenProperties(assertion, TOLERANCE_SEC); }
+
+private:
+  static inline const std::int64_t m_now = DateTime("2026-01-02T03:04:05.006Z").GetUtcTime();
+  Tarvel::System::ScopedEnvironment m_clock{{[] { return m_now; }, {}}};
+};
+
+TEST_F(CheckTokenPropertiesTest, AcceptsACurrentToken) {
+  EXPECT_NO_THROW(Check(Good()));
+  EXPECT_NO_THROW(Check(HolderOfKey()));
+}
+
+TEST_F(CheckTokenPropertiesTest, RefusesEveryOtherVersion) {
+  for (const std::string version : {"", "2", "2.0 ", " 2.0", "2.00", "1.1", "2.1"}) {
+    SamlAssertionType assertion = Good();
+    assertion.Version = version;
+    EXPECT_THROWS_MESSAGE(Check(assertion), ParseException, "Invalid token version");
+  }
+}
+
+TEST_F(CheckTokenPropertiesTest, RefusesAnIdThatDoesNotBeginWithAnUnderscore) {
+  for (const std::string id : {"", "123", "a_", " _1"}) {
+    SamlAssertionType assertion = Good();
+    assertion.ID = id;
+    EXPECT_THROWS_MESSAGE(Check(assertion), ParseException, "Invalid token ID");
+  }
+}
+
+TEST_F(CheckTokenPropertiesTest, AcceptsDigitsBehindAnUnderscore) {
+  SamlAssertionType assertion = Good();
+  for (const std::string id : {"_123", "_"}) {
+    assertion.ID = id;
+    EXPECT_NO_THROW(Check(assertion)) << id;
+  }
+}
+
+TEST_F(CheckTokenPropertiesTest, RefusesAWindowWithoutContentBeforeItLooksAtTheClock) {
+  const std::string message = "Unsatisfiable token validity conditions: NotBefore must be less than NotOnOrAfter.";
+  EXPECT_THROWS_MESSAGE(Check(ValidBetween(0, 0)), ParseException, message);
+  EXPECT_THROWS_MESSAGE(Check(ValidBetween(1, 0)), ParseException, message);
+  EXPECT_THROWS_MESSAGE(Check(ValidBetween(9000, 9000)), ParseException, message);
+  EXPECT_THROWS_MESSAGE(Check(ValidBetween(-9000, -9000)), ParseException, message);
+}
+
+TEST_F(CheckTokenPropertiesTest, ComparesInstantsWhateverTheirZone) {
+  SamlAssertionType assertion = HolderOfKey();
+  assertion.Conditions.NotBefore = DateTime("2026-01-02T05:00:00+02:00");
+  assertion.Conditions.NotOnOrAfter = DateTime("2026-01-02T03:00:01Z");
+  EXPECT_NO_THROW(Check(assertion));
+}
+
+TEST_F(CheckTokenPropertiesTest, AcceptsAStartWithinTheTolerance) {
+  EXPECT_NO_THROW(Check(ValidBetween(599, 3600)));
+  EXPECT_NO_THROW(Check(ValidBetween(600, 3600)));
+}
+
+TEST_F(CheckTokenPropertiesTest, RefusesAStartBeyondTheTolerance) {
+  EXPECT_THROWS_MESSAGE(Check(ValidBetween(601, 3600)), ParseException,
+                        "Token start date is in the future: 2026-01-02T03:14:06.006Z");
+}
+
+TEST_F(CheckTokenPropertiesTest, AcceptsAnEndWithinTheTolerance) {
+  EXPECT_NO_THROW(Check(ValidBetween(-3600, -599)));
+}
+
+TEST_F(CheckTokenPropertiesTest, RefusesAnEndAtTheToleranceAndTellsTheBareEnd) {
+  EXPECT_THROWS_MESSAGE(Check(ValidBetween(-3600, -600)), ParseException,
+                        "The token has expired at: 2026-01-02T02:54:05.006Z");
+  EXPECT_THROWS_MESSAGE(Check(ValidBetween(-3600, -601)), ParseException,
+                        "The token has expired at: 2026-01-02T02:54:04.006Z");
+}
+
+TEST_F(CheckTokenPropertiesTest, NarrowsTheWindowByANegativeTolerance) {
+  EXPECT_NO_THROW(CheckTokenProperties(ValidBetween(-60, 61), -60));
+  EXPECT_THROWS_MESSAGE(CheckTokenProperties(ValidBetween(-59, 3600), -60), ParseException,
+                        "Token start date is in the future: 2026-01-02T03:03:06.006Z");
+  EXPECT_THROWS_MESSAGE(CheckTokenProperties(ValidBetween(-3600, 60), -60), ParseException,
+                        "The token has expired at: 2026-01-02T03:05:05.006Z");
+}
+
+TEST_F(CheckTokenPropertiesTest, AcceptsEveryWindowWithATolerancePastAllTime) {
+  SamlAssertionType assertion = HolderOfKey();
+  for (const std::int64_t tolerance : {LARGEST, LARGEST / SECOND, LARGEST / SECOND + 1}) {
+    assertion.Conditions.NotBefore = DateTime("0001-01-01T00:00:00Z");
+    assertion.Conditions.NotOnOrAfter = DateTime("0001-01-01T00:00:01Z");
+    EXPECT_NO_THROW(CheckTokenProperties(assertion, tolerance));
+    assertion.Conditions.NotBefore = DateTime("9999-12-31T23:59:58Z");
+    assertion.Conditions.NotOnOrAfter = DateTime("9999-12-31T23:59:59Z");
+    EXPECT_NO_THROW(CheckTokenProperties(assertion, tolerance));
+  }
+}
+
+TEST_F(CheckTokenPropertiesTest, RefusesEveryWindowWithAToleranceBeforeAllTime) {
+  for (const std::int64_t tolerance : {SMALLEST, SMALLEST / SECOND, SMALLEST / SECOND - 1}) {
+    EXPECT_THROWS_MESSAGE(CheckTokenProperties(Good(), tolerance), ParseException,
+                          "Token start date is in the future: 2026-01-02T02:04:05.006Z");
+  }
+}
+
+TEST_F(CheckTokenPropertiesTest, RefusesABearerSubjectThatEndsBeforeTheToken) {
+  SamlAssertionType assertion = Good();
+  assertion.Subject.SubjectConfirmation.SubjectConfirmationData.NotOnOrAfter = AtSecond(3599);
+  EXPECT_THROWS_MESSAGE(Check(assertion), ParseException, "Invalid token subject validity");
+  EXPECT_THROWS_MESSAGE(CheckTokenProperties(assertion, LARGEST), ParseException, "Invalid token subject validity");
+}
+
+TEST_F(CheckTokenPropertiesTest, AcceptsABearerSubjectThatEndsLater) {
+  SamlAssertionType assertion = Good();
+  assertion.Subject.SubjectConfirmation.SubjectConfirmationData.NotOnOrAfter = AtSecond(3601);
+  EXPECT_NO_THROW(Check(assertion));
+}
+
+TEST_F(CheckTokenPropertiesTest, DoesNotAskWhenAHolderOfKeySubjectEnds) {
+  SamlAssertionType assertion = HolderOfKey();
+  assertion.Subject.SubjectConfirmation.SubjectConfirmationData.NotOnOrAfter = AtSecond(3599);
+  EXPECT_NO_THROW(Check(assertion));
+}
+
+SamlAssertionType WithDelegation(SamlAssertionType assertion, const boost::optional<NameIDType> &delegateId,
+                                 const std::vector<NameIDType> &delegates) {
+  assertion.Subject.SubjectConfirmation.NameID = delegateId;
+  if (!delegates.empty()) {
+    assertion.Conditions.DelegationRestriction.emplace();
+  }
+  for (const NameIDType &delegate : delegates) {
+    assertion.Conditions.DelegationRestriction->delegates.push_back({DateTime(), delegate});
+  }
+  return assertion;
+}
+
+TEST_F(CheckTokenPropertiesTest, AcceptsADelegateIdThatIsTheLastDelegate) {
+  EXPECT_NO_THROW(Check(WithDelegation(Good(), BACKUP, {BACKUP})));
+  EXPECT_NO_THROW(Check(WithDelegation(Good(), BACKUP, {GATEWAY, BACKUP})));
+}
+
+TEST_F(CheckTokenPropertiesTest, RefusesADelegateIdThatIsNotTheLastDelegate) {
+  const std::string message = "The SubjectConfirmation delegate id does not match the id of the last delegate";
+  EXPECT_THROWS_MESSAGE(Check(WithDelegation(Good(), GATEWAY, {GATEWAY, BACKUP})), ParseException, message);
+  EXPECT_THROWS_MESSAGE(Check(WithDelegation(Good(), NameIDType{"urn:other", BACKUP.value}, {BACKUP})), ParseException,
+                        message);
+  EXPECT_THROWS_MESSAGE(Check(WithDelegation(Good(), NameIDType{BACKUP.Format, "Backup@corp"}, {BACKUP})),
+                        ParseException, message);
+}
+
+TEST_F(CheckTokenPropertiesTest, RefusesADelegateIdWithoutDelegation) {
+  EXPECT_THROWS_MESSAGE(Check(WithDelegation(Good(), BACKUP, {})), ParseException,
+                        "Token SubjectConfirmation contains delegate id, but no delegation restriction is present");
+}
+
+TEST_F(CheckTokenPropertiesTest, RefusesDelegationWithoutADelegateId) {
+  EXPECT_THROWS_MESSAGE(Check(WithDelegation(Good(), boost::none, {BACKUP})), ParseException,
+                        "Token has delegation restriction, but no delegate id is present in the SubjectConfirmation");
+}
+
+TEST_F(CheckTokenPropertiesTest, NamesTheFirstRuleThatFails) {
+  SamlAssertionType assertion = WithDelegation(ValidBetween(9000, 9000), BACKUP, {});
+  assertion.Version = "3";
+  assertion.ID = "";
+  EXPECT_THROWS_MESSAGE(Check(assertion), ParseException, "Invalid token version");
+  assertion.Version = "2.0";
+  EXPECT_THROWS_MESSAGE(Check(assertion), ParseException, "Invalid token ID");
+  assertion.ID = "_1";
+  EXPECT_THROWS_MESSAGE(Check(assertion), ParseException,
+                        "Unsatisfiable token validity conditions: NotBefore must be less than NotOnOrAfter.");
+  assertion.Conditions.NotOnOrAfter = AtSecond(9001);
+  EXPECT_THROWS_MESSAGE(Check(assertion), ParseException,
+                        "Token start date is in the future: 2026-01-02T05:34:05.006Z");
+}
+
+} // namespace
