@@ -1,0 +1,28 @@
+// SPDX-License-Identifier: Apache-2.0
+/// @file
+/// Running the tool as a process.
+
+#pragma once
+
+#include <string>
+#include <vector>
+
+namespace ToolTest {
+
+struct Result {
+  int exitCode = -1; ///< 128 plus the signal when one ended the process
+  std::string out;
+  std::string err;
+};
+
+/// Runs the tool with `arguments`, in tests/data/tokens, with `input` as its standard input, to its end.
+Result RunTool(const std::vector<std::string> &arguments, const std::string &input = {});
+
+/// Runs `commandLine` by the shell, in `folder`, with "ssoclient" in the search path.
+Result RunShell(const std::string &commandLine, const std::string &folder = TEST_DATA_DIR "/tokens");
+
+/// Starts the tool with a standard input that stays open and silent, sends it `signal` once it catches that signal, and
+/// returns how it ended.
+Result RunToolAndSignal(const std::vector<std::string> &arguments, int signal);
+
+} // namespace ToolTest

@@ -1,0 +1,489 @@
+// SPDX-License-Identifier: Apache-2.0
+// What the tool prints and how it ends, whole.
+
+#include "process.h"
+
+#include "support/data_file.h"
+
+#include <gtest/gtest.h>
+
+#include <csignal>
+#include <filesystem>
+#include <fstream>
+#include <string>
+#include <vector>
+
+#include <unistd.h>
+
+namespace ToolTest {
+namespace {
+
+using Testing::ReadDataFile;
+
+constexpr const char *FULL_TEXT = R"(Id:              _a18b869b-2e81-c0c5-2955-2a3c4fa5c92e
+Subject:         alice@corp.example
+First name:      Alice
+Last name:       Liddell
+Confirmation:    holder-of-key
+Not before:      2020-01-01T00:00:00.000Z
+Not on or after: 2120-01-01T00:00:00.000Z
+Renewable:       yes
+Delegable:       yes
+Solution:        yes
+Group:           corp.example\Administrators
+Group:           corp.example\Users
+Group:           corp.example\Ops\Night Shift
+Delegate:        gateway@corp.example at 2020-01-01T00:00:01.250Z
+Delegate:        backup@corp.example at 2020-01-01T00:00:02.000Z
+Audience:        https://files.corp.example/
+Audience:        https://mail.corp.example/
+Advice:          urn:corp.example:mapper
+                 urn:corp.example:advice:color
+                 = green
+                 = blue
+                 urn:corp.example:advice:empty
+Advice:          urn:corp.example:audit
+Certificate:     CN=holder,O=Example
+                 SHA-256 @HOLDER_SHA256@
+)";
+
+/// The thumbprint of the fixtures' holder, which is made anew when the fixtures are.
+std::string HolderSha256() {
+  const Result result = RunShell(
+      "openssl x509 -in holder.crt -noout -fingerprint -sha256 | sed 's/.*=//;s/://g' | tr -d '\\n' | tr A-F a-f");
+  return result.out;
+}
+
+std::string WithHolder(std::string text) {
+  const std::string mark = "@HOLDER_SHA256@";
+  return text.replace(text.find(mark), mark.size(), HolderSha256());
+}
+
+constexpr const char *MINIMAL_JSON = R"({
+  "schema": 1,
+  "verified": @VERIFIED@,
+  "id": "_6786bdef-ac00-81c1-bcc9-518978be1746",
+  "subject": {
+    "name": "alice",
+    "domain": "corp.example"
+  },
+  "confirmation": "bearer",
+  "notBefore": "2020-01-01T00:00:00.000Z",
+  "notOnOrAfter": "2120-01-01T00:00:00.000Z",
+  "renewable": false,
+  "delegable": false,
+  "solution": false,
+  "fullName": {
+    "first": "",
+    "last": ""
+  },
+  "groups": [],
+  "delegation": [],
+  "audience": [],
+  "advice": [],
+  "certificate": null
+}
+)";
+
+constexpr const char *FULL_JSON = R"({
+  "schema": 1,
+  "verified": @VERIFIED@,
+  "id": "_a18b869b-2e81-c0c5-2955-2a3c4fa5c92e",
+  "subject": {
+    "name": "alice",
+    "domain": "corp.example"
+  },
+  "confirmation": "holder-of-key",
+  "notBefore": "2020-01-01T00:00:00.000Z",
+  "notOnOrAfter": "2120-01-01T00:00:00.000Z",
+  "renewable": true,
+  "delegable": true,
+  "solution": true,
+  "fullName": {
+    "first": "Alice",
+    "last": "Liddell"
+  },
+  "groups": [
+    {
+      "name": "Administrators",
+      "domain": "corp.example"
+    },
+    {
+      "name": "Users",
+      "domain": "corp.example"
+    },
+    {
+      "name": "Ops\\Night Shift",
+      "domain": "corp.example"
+    }
+  ],
+  "delegation": [
+    {
+      "name": "gateway",
+      "domain": "corp.example",
+      "instant": "2020-01-01T00:00:01.250Z"
+    },
+    {
+      "name": "backup",
+      "domain": "corp.example",
+      "instant": "2020-01-01T00:00:02.000Z"
+    }
+  ],
+  "audience": [
+    "https://files.corp.example/",
+    "https://mail.corp.example/"
+  ],
+  "advice": [
+    {
+      "source": "urn:corp.example:mapper",
+      "attributes": [
+        {
+          "name": "urn:corp.example:advice:color",
+          "values": [
+            "green",
+            "blue"
+          ]
+        },
+        {
+          "name": "urn:corp.example:advice:empty",
+          "values": []
+        }
+      ]
+    },
+    {
+      "source": "urn:corp.example:audit",
+      "attributes": []
+    }
+  ],
+  "certificate": {
+    "subject": "CN=holder,O=Example",
+    "sha256": "@HOLDER_SHA256@"
+  }
+}
+)";
+
+std::string Json(std::string text, bool verified) {
+  const std::string mark = "@VERIFIED@";
+  return text.replace(text.find(mark), mark.size(), verified ? "true" : "false");
+}
+
+/// A file of its own that is gone at the end.
+class TemporaryFile {
+public:
+  explicit TemporaryFile(const std::string &content)
+      : m_path(testing::TempDir() + "tool_test." + std::to_string(getpid()) + ".xml") {
+    std::ofstream(m_path, std::ios::binary) << content;
+  }
+  TemporaryFile(const TemporaryFile &) = delete;
+  TemporaryFile &operator=(const TemporaryFile &) = delete;
+  ~TemporaryFile() { std::filesystem::remove(m_path); }
+  const std::string &Path() const { return m_path; }
+
+private:
+  std::string m_path;
+};
+
+void ExpectResult(const Result &result, int exitCode, const std::string &out, const std::string &err) {
+  EXPECT_EQ(exitCode, result.exitCode);
+  EXPECT_EQ(out, result.out);
+  EXPECT_EQ(err, result.err);
+}
+
+TEST(Verify, ShowsAVerifiedTokenAsText) {
+  ExpectResult(RunTool({"verify", "--trust", "sts-rsa.crt", "full.xml"}), 0,
+               "Verified:        yes\n" + WithHolder(FULL_TEXT), "");
+}
+
+TEST(Verify, ShowsAVerifiedTokenAsJson) {
+  ExpectResult(RunTool({"verify", "--format", "json", "--trust", "sts-rsa.crt", "full.xml"}), 0,
+               Json(WithHolder(FULL_JSON), true), "");
+}
+
+TEST(Verify, ShowsATokenWithoutOptionalPartsAsJson) {
+  ExpectResult(RunTool({"verify", "--format", "json", "--trust", "sts-rsa.crt", "bearer-minimal.xml"}), 0,
+               Json(MINIMAL_JSON, true), "");
+}
+
+TEST(Verify, GivesTheTokenItselfAsXml) {
+  ExpectResult(RunTool({"verify", "--format", "xml", "--trust", "sts-rsa.crt", "style-pretty.xml"}), 0,
+               ReadDataFile("tokens/style-pretty.xml"), "");
+}
+
+TEST(Verify, ReadsStandardInputForADash) {
+  ExpectResult(
+      RunTool({"verify", "--format", "json", "--trust", "sts-rsa.crt", "-"}, ReadDataFile("tokens/bearer-minimal.xml")),
+      0, Json(MINIMAL_JSON, true), "");
+}
+
+TEST(Verify, TakesTheKeysOfAllTrustFiles) {
+  EXPECT_EQ(
+      0, RunTool({"verify", "--trust", "sts-rsa.crt", "--trust", "sts-ec256.crt", "ecdsa-p256-sha256.xml"}).exitCode);
+  EXPECT_EQ(0, RunTool({"verify", "--trust", "sts-bundle.pem", "signed-by-second.xml"}).exitCode);
+  EXPECT_EQ(0, RunTool({"verify", "--trust", "sts-rsa.der", "bearer.xml"}).exitCode);
+}
+
+constexpr const char *EXPIRED_WARNING =
+    "ssoclient: warning: the trusted certificate CN=sts expired,O=Example is not valid after "
+    "2021-01-01T00:00:00.000Z; its key is trusted all the same\n";
+
+TEST(Verify, WarnsOfATrustedCertificateThatIsOutOfDateAndTrustsItsKey) {
+  const Result result = RunTool({"verify", "--trust", "sts-rsa-expired.crt", "bearer-minimal.xml"});
+  EXPECT_EQ(0, result.exitCode);
+  EXPECT_EQ(EXPIRED_WARNING, result.err);
+}
+
+TEST(Verify, WarnsInJsonOnlyWhenAskedTo) {
+  const std::vector<std::string> line = {
+      "verify", "--format", "json", "--trust", "sts-rsa-expired.crt", "bearer-minimal.xml"};
+  ExpectResult(RunTool(line), 0, Json(MINIMAL_JSON, true), "");
+  std::vector<std::string> verbose = line;
+  verbose.push_back("-v");
+  ExpectResult(RunTool(verbose), 0, Json(MINIMAL_JSON, true), EXPIRED_WARNING);
+}
+
+TEST(Verify, TakesTheTolerance) {
+  // 2021-01-01 is not 200 years ago for a long time to come.
+  EXPECT_EQ(0, RunTool({"verify", "--tolerance", "6307200000", "--trust", "sts-rsa.crt", "expired.xml"}).exitCode);
+  EXPECT_EQ(5, RunTool({"verify", "--tolerance", "-6307200000", "--trust", "sts-rsa.crt", "bearer.xml"}).exitCode);
+}
+
+struct Refusal {
+  const char *name;
+  std::vector<std::string> arguments;
+  int exitCode;
+  const char *exceptionClass;
+  const char *label;
+  const char *message; ///< as in text; it holds nothing that JSON escapes
+};
+
+const Refusal REFUSALS[] = {
+    {"ExpiredToken",
+     {"--trust", "sts-rsa.crt", "expired.xml"},
+     5,
+     "ParseException",
+     "token invalid",
+     "The token has expired at: 2021-01-01T00:00:00.000Z"},
+    {"EarlyToken",
+     {"--trust", "sts-rsa.crt", "early.xml"},
+     5,
+     "ParseException",
+     "token invalid",
+     "Token start date is in the future: 2110-01-01T00:00:00.000Z"},
+    {"ForeignSigner",
+     {"--trust", "sts-rsa.crt", "signed-by-other.xml"},
+     6,
+     "InvalidSignatureException",
+     "signature invalid",
+     "Failed to verify signature: token might have been tampered with."},
+    {"TokenThatIsNoXml",
+     {"--trust", "sts-rsa.crt", "sts-rsa.crt"},
+     5,
+     "XMLParseException",
+     "token invalid",
+     "Start tag expected, '<' not found at line 1, column 1"},
+    {"TokenThatIsAnotherDocument",
+     {"--trust", "sts-rsa.crt", "../attacks/other-root.xml"},
+     5,
+     "ParseException",
+     "token invalid",
+     "Expected element 'Assertion' not found."},
+    {"TokenFileThatIsMissing",
+     {"--trust", "sts-rsa.crt", "missing.xml"},
+     7,
+     "IOException",
+     "file",
+     "missing.xml: No such file or directory"},
+    {"TokenFileThatIsAFolder",
+     {"--trust", "sts-rsa.crt", "templates"},
+     7,
+     "IOException",
+     "file",
+     "templates: Is a directory"},
+    {"TrustFileThatIsMissing",
+     {"--trust", "missing.crt", "bearer.xml"},
+     7,
+     "IOException",
+     "file",
+     "Cannot open missing.crt: No such file or directory"},
+    {"TrustFileWithoutCertificate",
+     {"--trust", "make.sh", "bearer.xml"},
+     7,
+     "CryptoException",
+     "key or certificate",
+     "make.sh: There is no certificate in the text"},
+    {"TrustFileWithAKey",
+     {"--trust", "certificate-with-key.pem", "bearer.xml"},
+     7,
+     "CryptoException",
+     "key or certificate",
+     "certificate-with-key.pem: Holds a private key (PRIVATE KEY) where only certificates belong"},
+    {"NoTrustFile", {"bearer.xml"}, 2, "UsageException", "usage", "--trust is required; see ssoclient --help"},
+    {"NoToken", {"--trust", "sts-rsa.crt"}, 2, "UsageException", "usage", "FILE is required; see ssoclient --help"},
+    {"ToleranceThatIsNoNumber",
+     {"--tolerance", "1x", "--trust", "sts-rsa.crt", "bearer.xml"},
+     2,
+     "UsageException",
+     "usage",
+     "Could not convert: --tolerance = 1x; see ssoclient --help"},
+    {"UnknownOption",
+     {"--nope", "--trust", "sts-rsa.crt", "bearer.xml"},
+     2,
+     "UsageException",
+     "usage",
+     "The following argument was not expected: --nope; see ssoclient --help"},
+};
+
+class VerifyRefusal : public testing::TestWithParam<Refusal> {};
+
+TEST_P(VerifyRefusal, IsOneLineOfTextAndAnExitCode) {
+  std::vector<std::string> line = {"verify"};
+  line.insert(line.end(), GetParam().arguments.begin(), GetParam().arguments.end());
+  ExpectResult(RunTool(line), GetParam().exitCode, "",
+               std::string("ssoclient: ") + GetParam().label + ": " + GetParam().message + "\n");
+}
+
+TEST_P(VerifyRefusal, IsOneJsonObjectAndTheSameExitCode) {
+  std::vector<std::string> line = {"verify", "--format", "json"};
+  line.insert(line.end(), GetParam().arguments.begin(), GetParam().arguments.end());
+  ExpectResult(RunTool(line), GetParam().exitCode, "",
+               std::string(R"({"schema":1,"error":{"class":")") + GetParam().exceptionClass + R"(","message":")" +
+                   GetParam().message + "\"}}\n");
+}
+
+INSTANTIATE_TEST_SUITE_P(Of, VerifyRefusal, testing::ValuesIn(REFUSALS),
+                         [](const auto &refusal) { return std::string(refusal.param.name); });
+
+TEST(Inspect, ShowsATokenAsTextAndSaysThatNothingWasChecked) {
+  ExpectResult(RunTool({"inspect", "full.xml"}), 0,
+               "Verified:        no, nothing below was checked\n" + WithHolder(FULL_TEXT), "");
+}
+
+TEST(Inspect, NeverClaimsToVerify) {
+  ExpectResult(RunTool({"inspect", "--format", "json", "full.xml"}), 0, Json(WithHolder(FULL_JSON), false), "");
+  ExpectResult(RunTool({"inspect", "--format", "json", "bearer-minimal.xml"}), 0, Json(MINIMAL_JSON, false), "");
+}
+
+TEST(Inspect, ShowsTokensThatWouldBeRefusedForDatesOrSignature) {
+  for (const char *file : {"expired.xml", "early.xml", "signed-by-other.xml", "../attacks/value-zeros.xml"}) {
+    const Result result = RunTool({"inspect", "--format", "json", file});
+    EXPECT_EQ(0, result.exitCode) << file;
+    EXPECT_NE(std::string::npos, result.out.find("\"verified\": false,")) << file;
+  }
+}
+
+TEST(Inspect, RefusesWhatIsNotOfTheFormOfAToken) {
+  ExpectResult(RunTool({"inspect", "../attacks/split-comment.xml"}), 5, "",
+               "ssoclient: token invalid: Element 'saml:NameID' must only have textual content (but has extra children "
+               "or is empty).\n");
+}
+
+TEST(Inspect, ReadsStandardInputAndGivesXmlAsItCame) {
+  const std::string token = ReadDataFile("tokens/style-pretty.xml");
+  ExpectResult(RunTool({"inspect", "--format", "xml", "-"}, token), 0, token, "");
+}
+
+TEST(Inspect, ShowsControlCharactersInsteadOfObeyingThem) {
+  std::string token = ReadDataFile("tokens/bearer-minimal.xml");
+  const std::string alice = ">alice@";
+  // A line feed that would feign a line, the C1 control that starts terminal sequences, and a turn of direction.
+  token.replace(token.find(alice), alice.size(), ">a\nVerified: yes\xC2\x9B\xE2\x80\xAE\xF0\x9F\x99\x82\xC3\xA9@");
+  const TemporaryFile file(token);
+  const Result text = RunTool({"inspect", file.Path()});
+  EXPECT_EQ(0, text.exitCode);
+  EXPECT_NE(std::string::npos,
+            text.out.find("\nSubject:         a\\u000AVerified: yes\\u009B\\u202E\xF0\x9F\x99\x82\xC3\xA9@"))
+      << text.out;
+  const Result json = RunTool({"inspect", "--format", "json", file.Path()});
+  EXPECT_NE(std::string::npos, json.out.find(R"("name": "a\nVerified: yes\u009b\u202e\ud83d\ude42\u00e9")"))
+      << json.out;
+}
+
+TEST(Tool, RefusesADocumentBeyondTheLimitWithoutReadingItAll) {
+  // Twice the limit; what is beyond it is not read, and the feeding end may break.
+  const Result result = RunTool({"inspect", "-"}, "<x>" + std::string(32u * 1024 * 1024, 'a'));
+  EXPECT_EQ(5, result.exitCode);
+  EXPECT_EQ("", result.out);
+  EXPECT_EQ(0u, result.err.find("ssoclient: token invalid: "));
+}
+
+TEST(Tool, ReportsAnOutputThatCannotBeWritten) {
+  const Result result = RunShell("ssoclient inspect bearer.xml >/dev/full");
+  ExpectResult(result, 7, "", "ssoclient: file: standard output: No space left on device\n");
+}
+
+TEST(Tool, EndsWith130WhenInterrupted) {
+  const Result result = RunToolAndSignal({"inspect", "-"}, SIGINT);
+  EXPECT_EQ(130, result.exitCode);
+}
+
+TEST(Tool, LeavesAnIgnoredInterruptIgnored) {
+  ExpectResult(RunShell("trap '' INT; ssoclient inspect --format json bearer-minimal.xml & wait $!"), 0,
+               Json(MINIMAL_JSON, false), "");
+}
+
+TEST(Tool, SaysItsVersion) {
+  ExpectResult(RunTool({"--version"}), 0, "ssoclient " SSOCLIENT_VERSION "\n", "");
+}
+
+TEST(Tool, WantsACommand) {
+  ExpectResult(RunTool({}), 2, "", "ssoclient: usage: A subcommand is required; see ssoclient --help\n");
+}
+
+TEST(Tool, RefusesAnUnknownFormat) {
+  ExpectResult(RunTool({"inspect", "--format", "yaml", "bearer.xml"}), 2, "",
+               "ssoclient: usage: --format: yaml not in {text,json,xml}; see ssoclient --help\n");
+}
+
+TEST(Tool, ListsItsCommandsAndExitCodesInTheHelp) {
+  const Result result = RunTool({"--help"});
+  EXPECT_EQ(0, result.exitCode);
+  EXPECT_EQ("", result.err);
+  EXPECT_NE(std::string::npos, result.out.find("\n  verify "));
+  EXPECT_NE(std::string::npos, result.out.find("\n  inspect "));
+  EXPECT_NE(std::string::npos, result.out.find(R"(Exit codes:
+  0    done; for validate: the token is valid
+  1    unexpected failure
+  2    wrong command line
+  3    credentials refused by the service
+  4    communication with the service failed
+  5    token invalid or expired; for validate: the verdict
+  6    signature invalid
+  7    a file, key, certificate or passphrase
+  8    any other failure that the service reports
+  130  interrupted
+)"));
+}
+
+/// The command lines under "Examples:" in a command's help.
+std::vector<std::string> Examples(const std::string &help) {
+  std::vector<std::string> examples;
+  for (std::size_t begin = help.find("\n  ssoclient ", help.find("Examples:")); begin != std::string::npos;
+       begin = help.find("\n  ssoclient ", begin + 1)) {
+    examples.push_back(help.substr(begin + 3, help.find('\n', begin + 1) - begin - 3));
+  }
+  return examples;
+}
+
+TEST(Tool, EveryExampleOfTheHelpRuns) {
+  const std::filesystem::path folder = testing::TempDir() + "tool_examples." + std::to_string(getpid());
+  std::filesystem::create_directories(folder);
+  const std::filesystem::path tokens = TEST_DATA_DIR "/tokens";
+  std::filesystem::copy_file(tokens / "bearer.xml", folder / "token.xml");
+  std::filesystem::copy_file(tokens / "sts-rsa.crt", folder / "sts.pem");
+  std::filesystem::copy_file(tokens / "sts-rsa-2.crt", folder / "next-sts.pem");
+  for (const char *command : {"verify", "inspect"}) {
+    const Result help = RunTool({command, "--help"});
+    EXPECT_EQ(0, help.exitCode);
+    const std::vector<std::string> examples = Examples(help.out);
+    EXPECT_EQ(2u, examples.size()) << help.out;
+    for (const std::string &example : examples) {
+      const Result result = RunShell(example, folder);
+      EXPECT_EQ(0, result.exitCode) << example << '\n' << result.err;
+      EXPECT_NE("", result.out) << example;
+    }
+  }
+  std::filesystem::remove_all(folder);
+}
+
+} // namespace
+} // namespace ToolTest

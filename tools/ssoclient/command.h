@@ -1,0 +1,30 @@
+// SPDX-License-Identifier: Apache-2.0
+/// @file
+/// `Command`, one row of the tool's table of commands.
+
+#pragma once
+
+#include "output.h"
+
+#include <CLI/CLI.hpp>
+
+#include <functional>
+
+namespace SsoClient::Tool {
+
+/// What a command does once its command line is read. Failures leave it as exceptions.
+using Action = std::function<void()>;
+
+struct Command {
+  const char *name;
+  const char *summary;
+  const char *examples; ///< command lines, one a line, for the end of the help
+
+  /// Adds the command's own options to `app`; the action reads what they hold. `output` outlives both.
+  Action (*define)(CLI::App &app, const OutputOptions &output);
+};
+
+Action DefineVerify(CLI::App &app, const OutputOptions &output);
+Action DefineInspect(CLI::App &app, const OutputOptions &output);
+
+} // namespace SsoClient::Tool

@@ -1,0 +1,91 @@
+// SPDX-License-Identifier: Apache-2.0
+/// @file
+/// The table of exit codes and the table of failures.
+
+#include "exit_code.h"
+
+#include <ssoclient/exceptions.h>
+#include <tarvel/core/exception.h>
+#include <tarvel/crypto/private_key.h>
+#include <tarvel/xml/parser.h>
+#include <tarvel/xml/security/exceptions.h>
+
+#include <new>
+
+namespace SsoClient::Tool {
+namespace {
+
+struct Meaning {
+  ExitCode code;
+  std::string_view text;
+};
+
+constexpr Meaning MEANINGS[] = {
+    {ExitCode::DONE, "done; for validate: the token is valid"},
+    {ExitCode::UNEXPECTED, "unexpected failure"},
+    {ExitCode::USAGE, "wrong command line"},
+    {ExitCode::CREDENTIALS_REFUSED, "credentials refused by the service"},
+    {ExitCode::COMMUNICATION, "communication with the service failed"},
+    {ExitCode::TOKEN_INVALID, "token invalid or expired; for validate: the verdict"},
+    {ExitCode::SIGNATURE_INVALID, "signature invalid"},
+    {ExitCode::FILE_OR_KEY, "a file, key, certificate or passphrase"},
+    {ExitCode::SERVICE_FAULT, "any other failure that the service reports"},
+    {ExitCode::INTERRUPTED, "interrupted"},
+};
+
+template <typename Class>
+bool IsA(const std::exception &failure) {
+  return dynamic_cast<const Class *>(&failure) != nullptr;
+}
+
+struct Row {
+  bool (*matches)(const std::exception &);
+  Failure failure;
+};
+
+// The first row that matches counts, so a class stands above its base.
+constexpr Row TABLE[] = {
+    {IsA<UsageException>, {ExitCode::USAGE, "UsageException", "usage"}},
+    {IsA<InvalidCredentialsException>,
+     {ExitCode::CREDENTIALS_REFUSED, "InvalidCredentialsException", "credentials refused"}},
+    {IsA<CommunicationException>, {ExitCode::COMMUNICATION, "CommunicationException", "communication failed"}},
+    {IsA<ParseException>, {ExitCode::TOKEN_INVALID, "ParseException", "token invalid"}},
+    {IsA<Tarvel::Xml::XMLParseException>, {ExitCode::TOKEN_INVALID, "XMLParseException", "token invalid"}},
+    {IsA<InvalidSignatureException>, {ExitCode::SIGNATURE_INVALID, "InvalidSignatureException", "signature invalid"}},
+    {IsA<Tarvel::Xml::Security::SignatureSyntaxException>,
+     {ExitCode::SIGNATURE_INVALID, "SignatureSyntaxException", "signature invalid"}},
+    {IsA<Tarvel::Xml::Security::XmlSecurityException>,
+     {ExitCode::SIGNATURE_INVALID, "XmlSecurityException", "signature invalid"}},
+    {IsA<Tarvel::IOException>, {ExitCode::FILE_OR_KEY, "IOException", "file"}},
+    {IsA<Tarvel::Crypto::WrongPassphraseException>, {ExitCode::FILE_OR_KEY, "WrongPassphraseException", "passphrase"}},
+    {IsA<Tarvel::Crypto::NoKeyException>, {ExitCode::FILE_OR_KEY, "NoKeyException", "key"}},
+    {IsA<Tarvel::Crypto::KeyMismatchException>, {ExitCode::FILE_OR_KEY, "KeyMismatchException", "key"}},
+    {IsA<Tarvel::Crypto::CryptoException>, {ExitCode::FILE_OR_KEY, "CryptoException", "key or certificate"}},
+    {IsA<SsoException>, {ExitCode::SERVICE_FAULT, "SsoException", "service fault"}},
+    {IsA<Tarvel::InvalidArgumentException>, {ExitCode::UNEXPECTED, "InvalidArgumentException", "unexpected failure"}},
+    {IsA<Tarvel::InvalidStateException>, {ExitCode::UNEXPECTED, "InvalidStateException", "unexpected failure"}},
+    {IsA<Tarvel::Exception>, {ExitCode::UNEXPECTED, "Exception", "unexpected failure"}},
+    {IsA<std::bad_alloc>, {ExitCode::UNEXPECTED, "bad_alloc", "out of memory"}},
+};
+
+} // namespace
+
+std::string ExitCodeHelp() {
+  std::string help = "Exit codes:\n";
+  for (const Meaning &meaning : MEANINGS) {
+    const std::string number = std::to_string(static_cast<int>(meaning.code));
+    help += "  " + number + std::string(5 - number.size(), ' ') + std::string(meaning.text) + "\n";
+  }
+  return help;
+}
+
+Failure Classify(const std::exception &failure) noexcept {
+  for (const Row &row : TABLE) {
+    if (row.matches(failure)) {
+      return row.failure;
+    }
+  }
+  return {ExitCode::UNEXPECTED, "exception", "unexpected failure"};
+}
+
+} // namespace SsoClient::Tool

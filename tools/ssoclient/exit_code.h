@@ -1,0 +1,46 @@
+// SPDX-License-Identifier: Apache-2.0
+/// @file
+/// The exit codes of the tool and which failure ends in which.
+
+#pragma once
+
+#include <exception>
+#include <stdexcept>
+#include <string>
+#include <string_view>
+
+namespace SsoClient::Tool {
+
+enum class ExitCode : int {
+  DONE = 0,
+  UNEXPECTED = 1,
+  USAGE = 2,
+  CREDENTIALS_REFUSED = 3,
+  COMMUNICATION = 4,
+  TOKEN_INVALID = 5,
+  SIGNATURE_INVALID = 6,
+  FILE_OR_KEY = 7,
+  SERVICE_FAULT = 8,
+  INTERRUPTED = 130,
+};
+
+/// The exit codes and what each means, as the help shows them.
+std::string ExitCodeHelp();
+
+/// A command line that the tool cannot act on.
+class UsageException : public std::runtime_error {
+public:
+  using std::runtime_error::runtime_error;
+};
+
+/// What a failure means to whoever called the tool.
+struct Failure {
+  ExitCode code;
+  std::string_view className; ///< the unqualified name of the exception's class
+  std::string_view label;     ///< begins the line that tells a person of it
+};
+
+/// Looks `failure` up in the one table of failures.
+Failure Classify(const std::exception &failure) noexcept;
+
+} // namespace SsoClient::Tool
