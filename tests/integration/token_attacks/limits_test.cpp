@@ -1,0 +1,222 @@
+// SPDX-License-Identifier: Apache-2.0
+// Documents that are large in one dimension: refused at a documented limit, or read at a cost that grows with their length
+// and no faster. Cost is counted in octets allocated, which no load on the machine can change.
+
+#include "outcome.h"
+
+#include <tarvel/xml/parser.h>
+
+#include <gtest/gtest.h>
+
+#include <cstddef>
+#include <cstdlib>
+#include <filesystem>
+#include <fstream>
+#include <iterator>
+#include <new>
+#include <string>
+
+namespace {
+
+std::size_t g_allocatedOctets = 0; // the tests of this program run on one thread
+
+void *Allocate(std::size_t size) {
+  g_allocatedOctets += size;
+  void *const memory = std::malloc(size ? size : 1);
+  if (!memory) {
+    throw std::bad_alloc();
+  }
+  return memory;
+}
+
+} // namespace
+
+void *operator new(std::size_t size) {
+  return Allocate(size);
+}
+void *operator new[](std::size_t size) {
+  return Allocate(size);
+}
+void operator delete(void *memory) noexcept {
+  std::free(memory);
+}
+void operator delete[](void *memory) noexcept {
+  std::free(memory);
+}
+void operator delete(void *memory, std::size_t) noexcept {
+  std::free(memory);
+}
+void operator delete[](void *memory, std::size_t) noexcept {
+  std::free(memory);
+}
+
+namespace Attacks {
+namespace {
+
+constexpr int MANY = 100000;
+
+std::string Repeated(const std::string &piece, int count) {
+  std::string text;
+  text.reserve(piece.size() * static_cast<std::size_t>(count));
+  for (int i = 0; i < count; ++i) {
+    text += piece;
+  }
+  return text;
+}
+
+/// `prefix` with a number from 0 up and `suffix`, `count` times.
+std::string Numbered(const std::string &prefix, const std::string &suffix, int count) {
+  std::string text;
+  for (int i = 0; i < count; ++i) {
+    text += prefix + std::to_string(i) + suffix;
+  }
+  return text;
+}
+
+struct Counted {
+  Outcome outcome;
+  std::size_t octets;
+};
+
+Counted CountToken(const std::string &xml) {
+  const std::size_t before = g_allocatedOctets;
+  Outcome outcome = TryToken(xml);
+  return {std::move(outcome), g_allocatedOctets - before};
+}
+
+/// The bearer token with `text` in its subject's name. It then fails at the signature, after everything else has been
+/// read, checked and digested.
+std::string WithSubject(const std::string &text) {
+  return Replaced(ReadToken("bearer"), "alice@", text + "@");
+}
+
+TEST(Limits, DepthOf100000IsRefusedAtTheLimit) {
+  const Counted counted = CountToken(Repeated("<x>", MANY) + Repeated("</x>", MANY));
+  EXPECT_EQ("XMLParseException", counted.outcome.exceptionClass);
+  EXPECT_EQ("elements are nested deeper than 256 at line 1, column 769", counted.outcome.text);
+  // Beyond the copy of the text there is nothing but the 256 elements.
+  EXPECT_LT(counted.octets, 7u * MANY * 4);
+}
+
+TEST(Limits, DepthOf100000InsideATokenIsRefusedAtTheLimit) {
+  const Outcome outcome = TryToken(WithSubject(Repeated("<x>", MANY) + Repeated("</x>", MANY)));
+  EXPECT_EQ("XMLParseException", outcome.exceptionClass) << outcome;
+}
+
+TEST(Limits, AttributesBeyondTheLimitAreRefused) {
+  const Outcome outcome = TryToken("<x" + Numbered(" a", "=\"\"", MANY) + "/>");
+  EXPECT_EQ((Outcome{"XMLParseException", "an element has more than 256 attributes at line 1, column 1"}), outcome);
+}
+
+TEST(Limits, NamespaceDeclarationsBeyondTheLimitAreRefused) {
+  const Outcome outcome = TryToken("<x" + Numbered(" xmlns:a", "=\"urn:x\"", MANY) + "/>");
+  EXPECT_EQ((Outcome{"XMLParseException", "an element has more than 256 attributes at line 1, column 1"}), outcome);
+}
+
+TEST(Limits, NamespaceDeclarationsThatAddUpBeyondTheLimitAreRefused) {
+  std::string xml;
+  for (int depth = 0; depth < 20; ++depth) {
+    xml += "<x" + Numbered(" xmlns:d" + std::to_string(depth) + "n", "=\"urn:x\"", 20) + ">";
+  }
+  const Outcome outcome = TryToken(xml + Repeated("</x>", 20));
+  EXPECT_EQ("XMLParseException", outcome.exceptionClass) << outcome;
+}
+
+TEST(Limits, DocumentBeyondTheLimitIsRefused) {
+  const Outcome outcome = TryToken("<x>" + std::string(Tarvel::Xml::MAX_DOCUMENT_BYTES, 'a') + "</x>");
+  EXPECT_EQ("XMLParseException", outcome.exceptionClass) << outcome;
+}
+
+TEST(Limits, LongTextsAreReadAtACostInProportionToTheirLength) {
+  const Counted small = CountToken(WithSubject(std::string(50'000, 'a')));
+  const Counted large = CountToken(WithSubject(std::string(5'000'000, 'a')));
+  EXPECT_EQ("InvalidSignatureException", small.outcome.exceptionClass) << small.outcome;
+  EXPECT_EQ("InvalidSignatureException", large.outcome.exceptionClass) << large.outcome;
+  EXPECT_LT(large.octets, small.octets * 150);
+}
+
+TEST(Limits, ManySmallNodesAreReadAtACostInProportionToTheirNumber) {
+  const std::string comment = "<!---->";
+  const Counted small =
+      CountToken(Replaced(ReadToken("bearer"), "<saml:Subject>", Repeated(comment, 1000) + "<saml:Subject>"));
+  const Counted large =
+      CountToken(Replaced(ReadToken("bearer"), "<saml:Subject>", Repeated(comment, MANY) + "<saml:Subject>"));
+  EXPECT_TRUE(small.outcome.IsAccepted()) << small.outcome;
+  EXPECT_EQ(small.outcome, large.outcome);
+  EXPECT_LT(large.octets, small.octets * 150);
+}
+
+TEST(Limits, ManyReferencesInASignatureAreRefusedBeforeAnyIsDigested) {
+  std::string xml = ReadToken("bearer");
+  const std::size_t begin = xml.find("<ds:Reference ");
+  const std::string reference = xml.substr(begin, xml.find("</ds:SignedInfo>") - begin);
+  const Outcome outcome = TryToken(xml.insert(begin, Repeated(reference, 10000)));
+  EXPECT_FALSE(outcome.IsAccepted());
+  EXPECT_NE("undocumented", outcome.exceptionClass) << outcome;
+}
+
+TEST(Limits, OneHundredThousandGroupsAreReadAtACostInProportion) {
+  const auto withGroups = [](int count) {
+    const std::string value = "<saml:AttributeValue>corp.example\\Users</saml:AttributeValue>";
+    return Replaced(ReadToken("bearer"), value, Repeated(value, count));
+  };
+  const Counted small = CountToken(withGroups(1000));
+  const Counted large = CountToken(withGroups(MANY));
+  EXPECT_EQ("InvalidSignatureException", large.outcome.exceptionClass) << large.outcome;
+  EXPECT_LT(large.octets, small.octets * 150);
+}
+
+/// bearer-50k with its groups repeated up to about 5 MB, signed afresh by xmlsec1: too large to be kept as a file.
+class LargeToken : public testing::Test {
+protected:
+  void SetUp() override {
+    std::string xml = ReadToken("bearer-50k");
+    const std::string first = "<saml:AttributeValue>corp.example\\Department 0001";
+    const std::size_t begin = xml.find(first);
+    const std::string groups = xml.substr(begin, xml.find("</saml:Attribute>", begin) - begin);
+    xml.insert(begin, Repeated(groups, 104));
+    Empty(xml, "ds:DigestValue");
+    Empty(xml, "ds:SignatureValue");
+
+    const std::filesystem::path folder =
+        std::filesystem::temp_directory_path() /
+        ("token_attacks." + std::to_string(::testing::UnitTest::GetInstance()->random_seed()) + "." +
+         std::to_string(std::hash<std::string>()(testing::TempDir() + __FILE__)));
+    std::filesystem::create_directories(folder);
+    const std::string in = (folder / "in.xml").string();
+    const std::string out = (folder / "out.xml").string();
+    std::ofstream(in, std::ios::binary) << xml;
+    const std::string command = "xmlsec1 --sign --privkey-pem " TEST_DATA_DIR "/tokens/sts-rsa.key --id-attr:ID "
+                                "urn:oasis:names:tc:SAML:2.0:assertion:Assertion --output " +
+                                out + " " + in + " 2>" + (folder / "log").string();
+    ASSERT_EQ(0, std::system(command.c_str()));
+    std::ifstream file(out, std::ios::binary);
+    m_xml.assign(std::istreambuf_iterator<char>(file), {});
+    std::filesystem::remove_all(folder);
+  }
+
+  static void Empty(std::string &xml, const std::string &element) {
+    const std::size_t begin = xml.find("<" + element + ">") + element.size() + 2;
+    xml.erase(begin, xml.find("</" + element, begin) - begin);
+  }
+
+  std::string m_xml;
+};
+
+TEST_F(LargeToken, OfFiveMegabytesIsAcceptedAtACostInProportionToFiftyKilobytes) {
+  ASSERT_GT(m_xml.size(), 5'000'000u);
+  const std::string small = ReadToken("bearer-50k");
+  const Counted five = CountToken(ReadToken("bearer-5k"));
+  const Counted fifty = CountToken(small);
+  const Counted large = CountToken(m_xml);
+  EXPECT_TRUE(fifty.outcome.IsAccepted()) << fifty.outcome;
+  EXPECT_TRUE(large.outcome.IsAccepted()) << large.outcome.exceptionClass;
+  // 1.5: growing vectors and strings may double once more.
+  EXPECT_LT(fifty.octets, five.octets * 16);
+  EXPECT_LT(static_cast<double>(large.octets), 1.5 * static_cast<double>(fifty.octets) *
+                                                   static_cast<double>(m_xml.size()) /
+                                                   static_cast<double>(small.size()));
+}
+
+} // namespace
+} // namespace Attacks

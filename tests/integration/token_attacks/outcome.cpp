@@ -1,0 +1,161 @@
+// SPDX-License-Identifier: Apache-2.0
+#include "outcome.h"
+
+#include "support/data_file.h"
+#include "xml/parse_xml.h"
+
+#include <ssoclient/create_saml_token.h>
+#include <ssoclient/exceptions.h>
+#include <tarvel/xml/parser.h>
+#include <tarvel/xml/security/exceptions.h>
+
+#include <sstream>
+#include <stdexcept>
+#include <typeinfo>
+#include <vector>
+
+namespace Attacks {
+namespace {
+
+using namespace SsoClient;
+
+// The exact class counts: a class derived from a documented one would be a surprise as well.
+std::string ClassOf(const std::exception &failure) {
+  const std::type_info &type = typeid(failure);
+  if (type == typeid(ParseException)) {
+    return "ParseException";
+  }
+  if (type == typeid(InvalidSignatureException)) {
+    return "InvalidSignatureException";
+  }
+  if (type == typeid(Tarvel::Xml::XMLParseException)) {
+    return "XMLParseException";
+  }
+  if (type == typeid(Tarvel::Xml::Security::XmlSecurityException)) { // documented for elements without canonical form
+    return "XmlSecurityException";
+  }
+  return "undocumented";
+}
+
+template <typename Factory>
+Outcome Try(const Factory &factory) {
+  try {
+    return {"", FactsOf(*factory())};
+  } catch (const std::exception &failure) {
+    return {ClassOf(failure), failure.what()};
+  } catch (...) {
+    return {"undocumented", "no std::exception"};
+  }
+}
+
+void AppendPrincipal(std::ostream &out, const char *label, const PrincipalId &principal) {
+  out << label << " {" << principal.name << "} {" << principal.domain << "}\n";
+}
+
+const Tarvel::Xml::Node *NextInDocumentOrder(const Tarvel::Xml::Node *node) {
+  if (node->GetFirstChild()) {
+    return node->GetFirstChild();
+  }
+  while (node && !node->GetNextSibling()) {
+    node = node->GetParent();
+  }
+  return node ? node->GetNextSibling() : nullptr;
+}
+
+const Tarvel::Xml::ElementNode &FindAssertion(const Tarvel::Xml::Document &document, std::size_t index) {
+  const Tarvel::Xml::Node *node = document.GetDocumentElement();
+  for (; node; node = NextInDocumentOrder(node)) {
+    const Tarvel::Xml::ElementNode *const element = Tarvel::Xml::AsElement(node);
+    if (element && element->GetLocalName() == "Assertion" && index-- == 0) {
+      return *element;
+    }
+  }
+  throw std::out_of_range("fewer assertions than asked for");
+}
+
+} // namespace
+
+std::ostream &operator<<(std::ostream &out, const Outcome &outcome) {
+  return out << (outcome.IsAccepted() ? "accepted" : outcome.exceptionClass) << '\t' << outcome.text;
+}
+
+std::string FactsOf(const SamlToken &token) {
+  std::ostringstream out;
+  out << "id {" << token.GetId() << "}\n";
+  AppendPrincipal(out, "subject", token.GetSubject());
+  out << "from " << token.GetStartDate().GetUtcTime() << " to " << token.GetEndDate().GetUtcTime() << '\n';
+  out << "flags " << token.IsRenewable() << token.IsDelegable() << token.IsSolution() << token.GetConfirmationMethod()
+      << '\n';
+  std::pair<std::string, std::string> fullName;
+  token.GetFullName(fullName);
+  out << "name {" << fullName.first << "} {" << fullName.second << "}\n";
+  std::vector<PrincipalId> groups;
+  token.GetGroups(groups);
+  for (const PrincipalId &group : groups) {
+    AppendPrincipal(out, "group", group);
+  }
+  std::vector<Delegate> chain;
+  token.GetDelegationChain(chain);
+  for (const Delegate &delegate : chain) {
+    AppendPrincipal(out, "delegate", delegate.subject);
+    out << "at " << delegate.delegationInstant.GetUtcTime() << '\n';
+  }
+  std::set<std::string> audience;
+  token.GetAudience(audience);
+  for (const std::string &text : audience) {
+    out << "audience {" << text << "}\n";
+  }
+  std::vector<Advice> advice;
+  token.GetAdvice(advice);
+  for (const Advice &one : advice) {
+    out << "advice {" << one.source << "}\n";
+    for (const AdviceAttribute &attribute : one.attributes) {
+      out << "attribute {" << attribute.name << "}";
+      for (const std::string &value : attribute.values) {
+        out << " {" << value << "}";
+      }
+      out << '\n';
+    }
+  }
+  if (token.GetConfirmationCertificate()) {
+    out << "certificate " << token.GetConfirmationCertificate()->GetSha256Thumbprint() << '\n';
+  }
+  return out.str();
+}
+
+const Tarvel::Crypto::CertificateList &Trusted() {
+  static const Tarvel::Crypto::CertificateList TRUSTED = [] {
+    Tarvel::Crypto::CertificateList list;
+    for (const char *name : {"sts-rsa", "sts-rsa3072", "sts-rsa1024", "sts-ec256", "sts-ec384", "sts-ec521"}) {
+      list.push_back(
+          Tarvel::Crypto::CreateCertificateFromPem(Testing::ReadDataFile(std::string("tokens/") + name + ".crt")));
+    }
+    return list;
+  }();
+  return TRUSTED;
+}
+
+Outcome TryToken(const std::string &xml) {
+  return Try([&] { return CreateSamlToken(xml, Trusted()); });
+}
+
+Outcome TryElement(const std::string &xml, std::size_t index) {
+  Tarvel::Ref<Tarvel::Xml::Document> document;
+  ParseXML(xml, document);
+  const Tarvel::Xml::ElementNode &element = FindAssertion(*document, index);
+  return Try([&] { return CreateSamlTokenFromDom(element, Trusted()); });
+}
+
+std::string ReadToken(const std::string &name) {
+  return Testing::ReadDataFile("tokens/" + name + ".xml");
+}
+
+std::string Replaced(std::string text, const std::string &from, const std::string &to) {
+  const std::size_t place = text.find(from);
+  if (place == std::string::npos) {
+    throw std::logic_error("nothing to replace: " + from);
+  }
+  return text.replace(place, from.size(), to);
+}
+
+} // namespace Attacks

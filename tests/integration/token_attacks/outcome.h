@@ -1,0 +1,47 @@
+// SPDX-License-Identifier: Apache-2.0
+/// @file
+/// `Outcome`, what came of a token: its facts, or the documented exception that refused it.
+
+#pragma once
+
+#include <ssoclient/saml_token.h>
+#include <tarvel/crypto/certificate.h>
+#include <tarvel/xml/node.h>
+
+#include <memory>
+#include <ostream>
+#include <string>
+
+namespace Attacks {
+
+struct Outcome {
+  std::string exceptionClass; ///< unqualified; "undocumented" for any class that the factories do not document; empty
+                              ///< when the token was accepted
+  std::string text;           ///< the exception's message, or every fact of the accepted token
+
+  bool IsAccepted() const { return exceptionClass.empty(); }
+  friend bool operator==(const Outcome &, const Outcome &) = default;
+};
+
+std::ostream &operator<<(std::ostream &out, const Outcome &outcome);
+
+/// Everything that `token` answers, but for its XML.
+std::string FactsOf(const SsoClient::SamlToken &token);
+
+/// The service's certificates that the fixtures are signed with, one of each algorithm; not "other".
+const Tarvel::Crypto::CertificateList &Trusted();
+
+/// What comes of `xml` with those certificates and the default tolerance.
+Outcome TryToken(const std::string &xml);
+
+/// What comes of the assertion number `index` (from 0, in document order) of the document `xml`.
+/// @throws std::out_of_range when there are fewer.
+Outcome TryElement(const std::string &xml, std::size_t index);
+
+/// A token fixture by its name without folder and extension.
+std::string ReadToken(const std::string &name);
+
+/// `text` with the first `from` replaced by `to`. @throws std::logic_error when there is none: the test is then wrong.
+std::string Replaced(std::string text, const std::string &from, const std::string &to);
+
+} // namespace Attacks

@@ -1,0 +1,164 @@
+// SPDX-License-Identifier: Apache-2.0
+// Every prefix, and thousands of small damages, of genuine tokens: never another exception than the documented ones, and
+// never a token that says something else than what was signed.
+
+#include "outcome.h"
+
+#include <gtest/gtest.h>
+
+#include <algorithm>
+#include <filesystem>
+#include <string>
+#include <vector>
+
+namespace Attacks {
+namespace {
+
+std::vector<std::string> TokenNames() {
+  std::vector<std::string> names;
+  for (const auto &entry : std::filesystem::directory_iterator(TEST_DATA_DIR "/tokens")) {
+    if (entry.path().extension() == ".xml") {
+      names.push_back(entry.path().stem());
+    }
+  }
+  std::sort(names.begin(), names.end());
+  return names;
+}
+
+std::string TestName(const testing::TestParamInfo<std::string> &info) {
+  std::string name = info.param;
+  std::replace(name.begin(), name.end(), '-', '_');
+  return name;
+}
+
+class Truncation : public testing::TestWithParam<std::string> {};
+
+TEST_P(Truncation, EveryPrefixIsRefusedByTheParser) {
+  const std::string xml = ReadToken(GetParam());
+  const Outcome whole = TryToken(xml);
+  // Beyond the end tag only comments and white space follow, and to cut those is no harm.
+  const std::size_t rootEnd = xml.rfind("Assertion>") + std::string("Assertion>").size();
+  // The large token repeats one line; a prime step visits each place of that line.
+  const std::size_t step = xml.size() > 20000 ? 61 : 1;
+  for (std::size_t length = 0; length < rootEnd; length += step) {
+    const Outcome outcome = TryToken(xml.substr(0, length));
+    ASSERT_EQ("XMLParseException", outcome.exceptionClass) << length << " octets: " << outcome;
+  }
+  for (std::size_t length = rootEnd; length <= xml.size(); ++length) {
+    const Outcome outcome = TryToken(xml.substr(0, length));
+    ASSERT_TRUE(outcome == whole || outcome.exceptionClass == "XMLParseException") << length << " octets: " << outcome;
+  }
+}
+
+INSTANTIATE_TEST_SUITE_P(Of, Truncation, testing::ValuesIn(TokenNames()), TestName);
+
+void ExpectHarmless(const std::string &damaged, const Outcome &genuine, const std::string &what) {
+  const Outcome outcome = TryToken(damaged);
+  ASSERT_NE("undocumented", outcome.exceptionClass) << what << ": " << outcome.text;
+  ASSERT_TRUE(!outcome.IsAccepted() || outcome == genuine) << what << ": " << outcome;
+}
+
+class Mutation : public testing::TestWithParam<std::string> {
+protected:
+  void SetUp() override { ASSERT_TRUE(m_genuine.IsAccepted()) << m_genuine; }
+
+  /// Small tokens get every damage at every place. In large ones the damages take turns, so that the sweep stays short.
+  bool IsTurn(std::size_t damage, std::size_t damages, std::size_t place) const {
+    return m_xml.size() < 2500 || place % damages == damage;
+  }
+
+  const std::string m_xml = ReadToken(GetParam());
+  const Outcome m_genuine = TryToken(m_xml);
+};
+
+TEST_P(Mutation, EachBitFlippedNeverYieldsOtherFacts) {
+  for (std::size_t place = 0; place < m_xml.size(); ++place) {
+    for (unsigned bit = 0; bit < 8; ++bit) {
+      if (!IsTurn(bit, 8, place)) {
+        continue;
+      }
+      std::string damaged = m_xml;
+      damaged[place] = static_cast<char>(static_cast<unsigned char>(damaged[place]) ^ (1u << bit));
+      ExpectHarmless(damaged, m_genuine, "bit " + std::to_string(bit) + " of octet " + std::to_string(place));
+      ASSERT_FALSE(HasFatalFailure());
+    }
+  }
+}
+
+TEST_P(Mutation, EachOctetReplacedByAMarkupCharacterNeverYieldsOtherFacts) {
+  const std::string characters("<>&\"'=:/ \n\0", 11);
+  for (std::size_t place = 0; place < m_xml.size(); ++place) {
+    for (std::size_t i = 0; i < characters.size(); ++i) {
+      if (!IsTurn(i, characters.size(), place)) {
+        continue;
+      }
+      std::string damaged = m_xml;
+      damaged[place] = characters[i];
+      ExpectHarmless(damaged, m_genuine, "a character at " + std::to_string(place));
+      ASSERT_FALSE(HasFatalFailure());
+    }
+  }
+}
+
+TEST_P(Mutation, EachChunkDeletedOrDoubledNeverYieldsOtherFacts) {
+  for (const std::size_t length : {1u, 7u, 32u, 129u, 1000u}) {
+    for (std::size_t place = 0; place + length <= m_xml.size(); place += std::max<std::size_t>(5, length / 3)) {
+      const std::string what = std::to_string(length) + " octets at " + std::to_string(place);
+      std::string deleted = m_xml;
+      deleted.erase(place, length);
+      ExpectHarmless(deleted, m_genuine, "deleted " + what);
+      ASSERT_FALSE(HasFatalFailure());
+      std::string doubled = m_xml;
+      doubled.insert(place, m_xml, place, length);
+      ExpectHarmless(doubled, m_genuine, "doubled " + what);
+      ASSERT_FALSE(HasFatalFailure());
+    }
+  }
+}
+
+/// Where each element, with all that is in it, begins and ends, found by the tags alone.
+std::vector<std::pair<std::size_t, std::size_t>> ElementRanges(const std::string &xml) {
+  std::vector<std::pair<std::size_t, std::size_t>> ranges;
+  std::vector<std::size_t> open;
+  for (std::size_t begin = xml.find('<'); begin != std::string::npos; begin = xml.find('<', begin + 1)) {
+    const std::size_t end = xml.find('>', begin) + 1;
+    if (xml[begin + 1] == '?' || xml[begin + 1] == '!') {
+      continue;
+    }
+    if (xml[begin + 1] == '/') {
+      ranges.emplace_back(open.back(), end);
+      open.pop_back();
+    } else if (xml[end - 2] == '/') {
+      ranges.emplace_back(begin, end);
+    } else {
+      open.push_back(begin);
+    }
+  }
+  return ranges;
+}
+
+TEST_P(Mutation, EachElementDeletedDoubledOrCopiedElsewhereNeverYieldsOtherFacts) {
+  const auto ranges = ElementRanges(m_xml);
+  ASSERT_GT(ranges.size(), 10u);
+  for (const auto &[begin, end] : ranges) {
+    const std::string element = m_xml.substr(begin, end - begin);
+    std::string deleted = m_xml;
+    deleted.erase(begin, end - begin);
+    ExpectHarmless(deleted, m_genuine, "deleted " + element.substr(0, 40));
+    ASSERT_FALSE(HasFatalFailure());
+    for (const auto &target : ranges) {
+      std::string copied = m_xml;
+      copied.insert(target.first, element);
+      ExpectHarmless(copied, m_genuine, "copied " + element.substr(0, 40) + " to " + std::to_string(target.first));
+      ASSERT_FALSE(HasFatalFailure());
+    }
+  }
+}
+
+INSTANTIATE_TEST_SUITE_P(Of, Mutation,
+                         testing::Values("bearer-minimal", "full", "style-default-namespace", "c14n-inclusive-prefixes",
+                                         "ecdsa-p256-sha256", "reference-empty-uri", "reference-two"),
+                         TestName);
+
+} // namespace
+} // namespace Attacks
