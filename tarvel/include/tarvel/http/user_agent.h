@@ -1,0 +1,102 @@
+// SPDX-License-Identifier: Apache-2.0
+/// @file
+/// The HTTP/1.1 client.
+
+#pragma once
+
+#include <tarvel/core/exception.h>
+#include <tarvel/core/export.h>
+#include <tarvel/core/ref.h>
+#include <tarvel/http/connection_spec.h>
+#include <tarvel/http/cookie_store.h>
+#include <tarvel/io/reader.h>
+#include <tarvel/system/scheduled_item.h>
+
+#include <cstddef>
+#include <cstdint>
+#include <functional>
+#include <string>
+#include <string_view>
+
+namespace Tarvel {
+namespace Http {
+
+constexpr std::size_t MAX_HEADER_BYTES = 64u * 1024;      ///< of a response, status line included
+constexpr std::size_t MAX_BODY_BYTES = 16u * 1024 * 1024; ///< of a response
+
+/// A response that is not HTTP/1.x as RFC 9112 has it, that contradicts itself, ends early or is over a limit.
+class TARVEL_API HttpException : public Exception {
+  TARVEL_EXCEPTION_BODY(HttpException, Exception);
+};
+
+/// A request to be sent. For one thread, and for one start. Its body is wiped when it is destroyed.
+class TARVEL_API ClientRequest : public Object {
+public:
+  /// Sets a header, in place of an earlier one of the same name.
+  /// @throws InvalidArgumentException when name or value may not stand in a header (line ends, control characters).
+  virtual void SetHeader(std::string_view name, std::string_view value) = 0;
+  /// Appends to the body.
+  virtual void WriteBody(std::string_view bytes) = 0;
+
+protected:
+  ~ClientRequest() override;
+};
+
+/// A whole response. As a reader it gives the body.
+class TARVEL_API ClientResponse : public Reader {
+public:
+  virtual int GetStatusCode() const noexcept = 0;
+  virtual const std::string &GetReasonPhrase() const noexcept = 0;
+  /// The value of a header, the first of that name in any letter case; false when there is none.
+  virtual bool GetHeader(std::string_view name, std::string &value) const = 0;
+
+protected:
+  ~ClientResponse() override;
+};
+
+/// A request that has been started.
+class TARVEL_API PendingRequestItem : public System::ScheduledItem {
+protected:
+  ~PendingRequestItem() override;
+};
+
+/// Connections kept for later requests. None is offered yet: a user agent is created with a null pool and opens one
+/// connection for each request.
+class TARVEL_API ConnectionPool : public Object {
+protected:
+  ~ConnectionPool() override;
+};
+
+/// Sends requests over connections of one specification, with the cookies of one store. Safe on any thread.
+class TARVEL_API UserAgent : public Object {
+public:
+  /// Called exactly once for each start, on an I/O thread: with null and the whole response, or with an exception and
+  /// null. The exception is valid during the call. The item is the one that `StartRequest` hands out. An exception that
+  /// leaves the function is logged and goes no further.
+  using CompletionFunction =
+      std::function<void(const Exception *, const Ref<ClientResponse> &, const Ref<PendingRequestItem> &)>;
+
+  /// Connects, sends and reads the response, without blocking. Redirects are not followed, content is not decoded.
+  virtual void StartRequest(const Ref<ClientRequest> &request, CompletionFunction completion,
+                            Ref<PendingRequestItem> &pending) = 0;
+
+  /// Waits until the request is done and its completion function has run.
+  /// @param timeoutMicroseconds counted from this call; when it has passed, the request is cancelled.
+  /// @throws System::TimeoutException after the time-out; otherwise what the request failed with, as its own class.
+  virtual void WaitForRequest(const Ref<PendingRequestItem> &pending, std::int64_t timeoutMicroseconds,
+                              Ref<ClientResponse> &response) = 0;
+
+protected:
+  ~UserAgent() override;
+};
+
+/// @param pool must be null.
+TARVEL_API void CreateHttpUserAgent(const Ref<ConnectionSpec> &spec, const Ref<CookieStore> &cookies,
+                                    const Ref<ConnectionPool> &pool, Ref<UserAgent> &out);
+
+/// @param method as "POST". @param path path and query, beginning with "/".
+/// @throws InvalidArgumentException when either may not stand in a request line.
+TARVEL_API void CreateHttpRequest(std::string_view method, std::string_view path, Ref<ClientRequest> &out);
+
+} // namespace Http
+} // namespace Tarvel
