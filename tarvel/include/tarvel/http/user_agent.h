@@ -33,7 +33,9 @@ class TARVEL_API HttpException : public Exception {
 class TARVEL_API ClientRequest : public Object {
 public:
   /// Sets a header, in place of an earlier one of the same name.
-  /// @throws InvalidArgumentException when name or value may not stand in a header (line ends, control characters).
+  /// @throws InvalidArgumentException when name or value may not stand in a header (line ends, control characters), or
+  ///         the user agent itself sets that header: Host, Connection, Content-Length, Transfer-Encoding, Expect, Cookie
+  ///         and Accept-Encoding.
   virtual void SetHeader(std::string_view name, std::string_view value) = 0;
   /// Appends to the body.
   virtual void WriteBody(std::string_view bytes) = 0;
@@ -67,7 +69,9 @@ protected:
   ~ConnectionPool() override;
 };
 
-/// Sends requests over connections of one specification, with the cookies of one store. Safe on any thread.
+/// Sends requests over connections of one specification, with the cookies of one store. A connection counts as secure
+/// (for the Host header's port, and for cookies that are for secure connections only) when its stream is an
+/// `Ssl::SSLStream`. Safe on any thread.
 class TARVEL_API UserAgent : public Object {
 public:
   /// Called exactly once for each start, on an I/O thread: with null and the whole response, or with an exception and
@@ -76,13 +80,20 @@ public:
   using CompletionFunction =
       std::function<void(const Exception *, const Ref<ClientResponse> &, const Ref<PendingRequestItem> &)>;
 
-  /// Connects, sends and reads the response, without blocking. Redirects are not followed, content is not decoded.
+  /// Connects, sends and reads the response, without blocking, and without a time-out of its own: who does not wait may
+  /// cancel the item. Redirects are not followed. Content is not decoded; as no coding is asked for, content that has one
+  /// is a failure. The request's body is wiped once it is sent.
+  /// @throws InvalidArgumentException for a request that `CreateHttpRequest` did not make, InvalidStateException for one
+  ///         that has been started, and whatever the connection specification throws; the completion function is not
+  ///         called then.
   virtual void StartRequest(const Ref<ClientRequest> &request, CompletionFunction completion,
                             Ref<PendingRequestItem> &pending) = 0;
 
-  /// Waits until the request is done and its completion function has run.
+  /// Waits until the request is done and its completion function has run. Not for use in a completion function, which
+  /// would wait for itself.
   /// @param timeoutMicroseconds counted from this call; when it has passed, the request is cancelled.
-  /// @throws System::TimeoutException after the time-out; otherwise what the request failed with, as its own class.
+  /// @throws System::TimeoutException after the time-out; otherwise what the request failed with, as its own class;
+  ///         InvalidArgumentException for an item that is no request.
   virtual void WaitForRequest(const Ref<PendingRequestItem> &pending, std::int64_t timeoutMicroseconds,
                               Ref<ClientResponse> &response) = 0;
 
@@ -90,7 +101,7 @@ protected:
   ~UserAgent() override;
 };
 
-/// @param pool must be null.
+/// @param pool must be null. @throws InvalidArgumentException when it is not, or one of the others is null.
 TARVEL_API void CreateHttpUserAgent(const Ref<ConnectionSpec> &spec, const Ref<CookieStore> &cookies,
                                     const Ref<ConnectionPool> &pool, Ref<UserAgent> &out);
 

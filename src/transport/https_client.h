@@ -1,0 +1,44 @@
+// SPDX-License-Identifier: Apache-2.0
+/// @file
+/// `HttpsClient`, the transport over HTTP and HTTPS.
+
+#pragma once
+
+#include "exchange/transport.h"
+
+#include <tarvel/core/ref.h>
+#include <tarvel/http/connection_spec.h>
+#include <tarvel/ssl/ssl_context.h>
+
+#include <cstdint>
+#include <memory>
+#include <string>
+
+namespace SsoClient {
+
+/// Posts to one address. Immutable; safe on any thread.
+class HttpsClient final : public Transport {
+public:
+  /// @param url the service's address. Plain http is accepted without complaint: its users decide.
+  /// @param context may be null for http; shared with the client. @param sslParameter and @param useDomainControllerName
+  ///        as in `CreateSsoSSLConnectionSpec`.
+  /// @param timeoutMicroseconds for each request of the sessions that waits, from the connect to the response's last byte.
+  /// @throws Tarvel::Http::MalformedURLException for a bad address, Tarvel::InvalidArgumentException for https without a
+  ///         context.
+  HttpsClient(const std::string &url, const Tarvel::Ref<Tarvel::Ssl::SSLContext> &context,
+              const std::string &sslParameter, std::int64_t timeoutMicroseconds, bool useDomainControllerName);
+  HttpsClient(const std::string &url, const Tarvel::Ref<Tarvel::Ssl::SSLContext> &context,
+              const std::string &sslParameter, std::int64_t timeoutMicroseconds);
+
+  std::shared_ptr<TransportSession> CreateSession() const override;
+
+private:
+  void Init(const std::string &url, const std::string &sslParameter, bool useDomainControllerName);
+
+  Tarvel::Ref<Tarvel::Http::ConnectionSpec> m_spec;
+  const Tarvel::Ref<Tarvel::Ssl::SSLContext> m_context;
+  std::string m_path;
+  const std::int64_t m_timeoutMicroseconds;
+};
+
+} // namespace SsoClient

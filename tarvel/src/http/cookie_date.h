@@ -1,0 +1,17 @@
+// SPDX-License-Identifier: Apache-2.0
+/// @file
+/// The date of a cookie's Expires attribute.
+
+#pragma once
+
+#include <cstdint>
+#include <optional>
+#include <string_view>
+
+namespace Tarvel::Http {
+
+/// The date in `text` as microseconds since 1970, UTC, read as leniently as RFC 6265, section 5.1.1, says; none when
+/// that fails.
+std::optional<std::int64_t> ParseCookieDate(std::string_view text);
+
+} // namespace Tarvel::Http

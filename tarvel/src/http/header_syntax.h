@@ -1,0 +1,31 @@
+// SPDX-License-Identifier: Apache-2.0
+/// @file
+/// What may stand in the header of an HTTP message (RFC 9110, section 5), and how its texts compare.
+
+#pragma once
+
+#include <string>
+#include <string_view>
+#include <utility>
+#include <vector>
+
+namespace Tarvel::Http {
+
+/// Name and value of each header, in the order in which they are sent. Names may repeat.
+using HeaderFields = std::vector<std::pair<std::string, std::string>>;
+
+bool IsControlCharacter(char c) noexcept;
+
+/// A method or a header's name: one or more letters, digits and !#$%&'*+-.^_`|~
+bool IsToken(std::string_view text) noexcept;
+
+/// A text without control characters, so that it cannot end a line.
+bool IsFieldValue(std::string_view text) noexcept;
+
+/// Letter case of ASCII letters aside.
+bool EqualsIgnoringCase(std::string_view left, std::string_view right) noexcept;
+
+/// Without the blanks and tabs around it.
+std::string_view TrimBlanks(std::string_view text) noexcept;
+
+} // namespace Tarvel::Http

@@ -1,0 +1,247 @@
+// SPDX-License-Identifier: Apache-2.0
+
+#include "http/http_exchange.h"
+
+#include "http/client_response_impl.h"
+#include "system/uncaught_exception.h"
+
+#include <tarvel/core/secure_wipe.h>
+#include <tarvel/ssl/ssl_context.h>
+
+#include <algorithm>
+#include <utility>
+
+namespace Tarvel::Http {
+
+namespace {
+
+constexpr std::chrono::microseconds MAX_TIMEOUT = std::chrono::hours(24 * 365); // so that no addition overflows
+
+/// "4 seconds", "0.25 seconds".
+std::string DescribeSeconds(std::chrono::microseconds time) {
+  constexpr std::int64_t MICROSECONDS = 1000000;
+  std::string text = std::to_string(time.count() / MICROSECONDS);
+  const std::int64_t rest = time.count() % MICROSECONDS;
+  if (rest > 0) {
+    const std::string digits = std::to_string(MICROSECONDS + rest).substr(1);
+    text.append(".").append(digits, 0, digits.find_last_not_of('0') + 1);
+  }
+  return text + " seconds";
+}
+
+/// The Host header (RFC 9110, section 7.2): an IPv6 address in brackets, and a port that is not the scheme's own.
+std::string MakeHostHeader(const ConnectionSpec &spec, bool isSecure) {
+  std::string host = spec.GetHost();
+  if (host.find(':') != std::string::npos && host.front() != '[') {
+    host = "[" + host + "]";
+  }
+  const std::string endpoint = spec.GetEndpointString();
+  const std::size_t colon = endpoint.rfind(':');
+  const std::string port = colon == std::string::npos ? "" : endpoint.substr(colon + 1);
+  if (!port.empty() && port != (isSecure ? "443" : "80")) {
+    host += ":" + port;
+  }
+  if (host.empty() || !IsFieldValue(host)) {
+    throw InvalidArgumentException("the host of a connection may not stand in an HTTP header.");
+  }
+  return host;
+}
+
+} // namespace
+
+HttpExchange::HttpExchange(const Ref<ConnectionSpec> &spec, const Ref<CookieStore> &cookies, RequestData request,
+                           UserAgent::CompletionFunction completion)
+    : m_spec(spec), m_cookies(cookies), m_endpoint(spec->GetEndpointString()), m_request(std::move(request)),
+      m_reader(m_request.method == "HEAD"), m_completion(std::move(completion)) {}
+
+HttpExchange::~HttpExchange() {
+  SecureWipe(m_message);
+}
+
+void HttpExchange::Start() {
+  const Ref self(this);
+  Ref<System::ScheduledItem> connecting = m_spec->AsyncConnect(
+      [self](const Ref<System::Stream> &stream, const Exception *failure) { self->OnConnected(stream, failure); });
+  bool isCancelled = false;
+  {
+    const std::lock_guard<std::mutex> lock(m_mutex);
+    if (m_isFinishing || m_stream) {
+      return; // connected, or failed, already
+    }
+    m_connecting = connecting;
+    isCancelled = m_isCancelled;
+  }
+  if (isCancelled && connecting) {
+    connecting->Cancel();
+  }
+}
+
+void HttpExchange::OnConnected(const Ref<System::Stream> &stream, const Exception *failure) {
+  bool isCancelled = false;
+  {
+    const std::lock_guard<std::mutex> lock(m_mutex);
+    m_connecting.reset();
+    m_stream = stream;
+    isCancelled = m_isCancelled;
+  }
+  if (failure || isCancelled) {
+    Finish(failure, nullptr);
+    return;
+  }
+  Step([this, &stream] {
+    Send(stream);
+    Read(stream);
+  });
+}
+
+// Reading begins at once: a server may answer, and end the connection, before it has read a request that it refuses.
+void HttpExchange::Send(const Ref<System::Stream> &stream) {
+  m_isSecure = dynamic_cast<Ssl::SSLStream *>(stream.get()) != nullptr;
+  m_message = Serialise(m_request, MakeHostHeader(*m_spec, m_isSecure),
+                        m_cookies->GetHeader(m_spec->GetHost(), m_request.target, m_isSecure));
+  SecureWipe(m_request.body);
+  // A write that fails is no news: the read, which ends as well then, tells what there is to tell.
+  stream->AsyncWrite(m_message.data(), m_message.size(),
+                     [self = Ref(this)](std::size_t, const Exception *) { self->OnWritten(); });
+}
+
+void HttpExchange::OnWritten() {
+  SecureWipe(m_message);
+}
+
+void HttpExchange::Read(const Ref<System::Stream> &stream) {
+  stream->AsyncReadSome(m_buffer.data(), m_buffer.size(),
+                        [self = Ref(this)](std::size_t count, const Exception *failure) {
+                          self->Step([&self, count, failure] { self->OnRead(count, failure); });
+                        });
+}
+
+void HttpExchange::OnRead(std::size_t count, const Exception *failure) {
+  if (failure) {
+    Fail(*failure);
+    return;
+  }
+  try {
+    if (count == 0) {
+      m_reader.PutEnd();
+    } else {
+      m_reader.Put({m_buffer.data(), count});
+    }
+  } catch (const HttpException &exception) {
+    throw HttpException("Bad response from " + m_endpoint + ": " + exception.what());
+  }
+  if (!m_reader.IsComplete()) {
+    Ref<System::Stream> stream;
+    {
+      const std::lock_guard<std::mutex> lock(m_mutex);
+      stream = m_stream;
+    }
+    Read(stream);
+    return;
+  }
+  ResponseData response = m_reader.Take();
+  KeepCookies(response);
+  Finish(nullptr, MakeRef<ClientResponseImpl>(std::move(response)));
+}
+
+void HttpExchange::KeepCookies(const ResponseData &response) {
+  for (const auto &[name, value] : response.fields) {
+    if (EqualsIgnoringCase(name, "Set-Cookie")) {
+      m_cookies->SetFromHeader(value, m_spec->GetHost(), m_request.target, m_isSecure);
+    }
+  }
+}
+
+void HttpExchange::Step(const std::function<void()> &step) {
+  try {
+    step();
+  } catch (const Exception &exception) {
+    Fail(exception);
+  } catch (const std::exception &exception) {
+    Fail(System::NetworkException("The request to " + m_endpoint + " failed: " + exception.what()));
+  }
+}
+
+/// Neither failure nor response: the request was cancelled.
+void HttpExchange::Finish(const Exception *failure, const Ref<ClientResponse> &response) {
+  Ref<System::Stream> stream;
+  UserAgent::CompletionFunction completion;
+  std::shared_ptr<const Exception> outcome(failure ? failure->Clone() : nullptr);
+  {
+    const std::lock_guard<std::mutex> lock(m_mutex);
+    if (std::exchange(m_isFinishing, true)) {
+      return;
+    }
+    stream = std::move(m_stream);
+    completion = std::exchange(m_completion, nullptr);
+    if (m_isCancelled && !response) {
+      outcome = std::make_shared<System::NetworkException>("The request to " + m_endpoint + " was cancelled");
+    }
+  }
+  if (stream) {
+    stream->Close();
+  }
+  Complete(completion, outcome.get(), response);
+  completion = nullptr; // what it holds is gone before anybody who waits goes on
+  {
+    const std::lock_guard<std::mutex> lock(m_mutex);
+    m_failure = outcome;
+    m_response = response;
+    m_isDone = true;
+  }
+  m_done.notify_all();
+}
+
+void HttpExchange::Complete(const UserAgent::CompletionFunction &completion, const Exception *failure,
+                            const Ref<ClientResponse> &response) noexcept {
+  if (!completion) {
+    return;
+  }
+  try {
+    completion(failure, response, Ref<PendingRequestItem>(this));
+  } catch (...) {
+    System::LogUncaughtException("the completion function of an HTTP request");
+  }
+}
+
+Ref<ClientResponse> HttpExchange::Wait(std::chrono::microseconds timeout) {
+  timeout = std::clamp(timeout, std::chrono::microseconds(0), MAX_TIMEOUT);
+  const auto deadline = std::chrono::steady_clock::now() + timeout;
+  std::unique_lock<std::mutex> lock(m_mutex);
+  if (!m_done.wait_until(lock, deadline, [this] { return m_isDone; })) {
+    lock.unlock();
+    Cancel();
+    throw System::TimeoutException("No response from " + m_endpoint + " within " + DescribeSeconds(timeout));
+  }
+  if (m_failure) {
+    m_failure->Throw();
+  }
+  return m_response;
+}
+
+void HttpExchange::Cancel() noexcept {
+  Ref<System::ScheduledItem> connecting;
+  Ref<System::Stream> stream;
+  {
+    const std::lock_guard<std::mutex> lock(m_mutex);
+    if (m_isFinishing) {
+      return;
+    }
+    m_isCancelled = true;
+    connecting = m_connecting;
+    stream = m_stream;
+  }
+  if (connecting) {
+    connecting->Cancel();
+  }
+  if (stream) {
+    stream->Close();
+  }
+}
+
+bool HttpExchange::IsDone() const noexcept {
+  const std::lock_guard<std::mutex> lock(m_mutex);
+  return m_isDone;
+}
+
+} // namespace Tarvel::Http

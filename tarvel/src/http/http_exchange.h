@@ -1,0 +1,85 @@
+// SPDX-License-Identifier: Apache-2.0
+/// @file
+/// One request and its response, over one connection.
+
+#pragma once
+
+#include "http/client_request_impl.h"
+#include "http/response_reader.h"
+
+#include <tarvel/http/connection_spec.h>
+#include <tarvel/http/cookie_store.h>
+#include <tarvel/http/user_agent.h>
+
+#include <array>
+#include <chrono>
+#include <condition_variable>
+#include <cstddef>
+#include <functional>
+#include <memory>
+#include <mutex>
+#include <string>
+
+namespace Tarvel::Http {
+
+/// Connects, sends and reads, each step started by the end of the one before, on the I/O threads. It keeps itself alive
+/// by the handlers that are pending.
+class HttpExchange final : public PendingRequestItem {
+public:
+  HttpExchange(const Ref<ConnectionSpec> &spec, const Ref<CookieStore> &cookies, RequestData request,
+               UserAgent::CompletionFunction completion);
+
+  /// Once.
+  void Start();
+
+  /// Waits, on this thread alone, until the completion function has run.
+  /// @throws System::TimeoutException after cancelling; otherwise what the request failed with.
+  Ref<ClientResponse> Wait(std::chrono::microseconds timeout);
+
+  void Cancel() noexcept override;
+  bool IsDone() const noexcept override;
+
+private:
+  static constexpr std::size_t BUFFER_BYTES = 16 * 1024; // a TLS record
+
+  ~HttpExchange() override;
+
+  void OnConnected(const Ref<System::Stream> &stream, const Exception *failure);
+  void OnWritten();
+  void OnRead(std::size_t count, const Exception *failure);
+
+  void Send(const Ref<System::Stream> &stream);
+  void Read(const Ref<System::Stream> &stream);
+  void KeepCookies(const ResponseData &response);
+
+  /// Runs one step of the road; what it throws is how the exchange ends.
+  void Step(const std::function<void()> &step);
+  void Fail(const Exception &failure) { Finish(&failure, nullptr); }
+  void Finish(const Exception *failure, const Ref<ClientResponse> &response);
+  void Complete(const UserAgent::CompletionFunction &completion, const Exception *failure,
+                const Ref<ClientResponse> &response) noexcept;
+
+  const Ref<ConnectionSpec> m_spec;
+  const Ref<CookieStore> m_cookies;
+  const std::string m_endpoint; // for messages
+
+  // For one step at a time, hence without a lock. The message stays until it is written; then it is wiped.
+  RequestData m_request;
+  std::string m_message;
+  std::array<char, BUFFER_BYTES> m_buffer;
+  ResponseReader m_reader;
+  bool m_isSecure = false;
+
+  mutable std::mutex m_mutex; // guards all that follows; never held while a handler or a completion function runs
+  std::condition_variable m_done;
+  Ref<System::ScheduledItem> m_connecting;
+  Ref<System::Stream> m_stream;
+  UserAgent::CompletionFunction m_completion;
+  bool m_isCancelled = false;
+  bool m_isFinishing = false; // the outcome stands, the completion function may be running
+  bool m_isDone = false;
+  std::shared_ptr<const Exception> m_failure;
+  Ref<ClientResponse> m_response;
+};
+
+} // namespace Tarvel::Http

@@ -1,0 +1,72 @@
+// SPDX-License-Identifier: Apache-2.0
+/// @file
+/// From the bytes of a connection to one whole response.
+
+#pragma once
+
+#include "http/chunked_body.h"
+#include "http/header_syntax.h"
+
+#include <tarvel/http/user_agent.h>
+
+#include <cstddef>
+#include <memory>
+#include <string>
+#include <string_view>
+
+namespace Tarvel::Http {
+
+struct ResponseData {
+  int status = 0;
+  std::string reason;
+  HeaderFields fields; ///< of the header; a trailer's are dropped
+  std::string body;
+};
+
+class ResponseHeaderParser;
+
+/// Reads the final response to one request, passing over interim ones (1xx but 101), in pieces of any size. Strict where
+/// leniency would let two parties read the same bytes differently, or take a part for the whole. Messages of its
+/// exceptions are half sentences about the response. After an exception it must not be used again.
+class ResponseReader {
+public:
+  /// @param answersHead whether the request's method is HEAD, so that no body follows whatever the header says.
+  explicit ResponseReader(bool answersHead = false);
+  ResponseReader(const ResponseReader &) = delete;
+  ResponseReader &operator=(const ResponseReader &) = delete;
+  ~ResponseReader();
+
+  /// @throws HttpException when the bytes are no response, contradict themselves, are over a limit, or go on after the
+  ///         response's end.
+  void Put(std::string_view bytes);
+
+  /// The connection has ended in order, which is how a body without a length ends.
+  /// @throws HttpException when the response is not complete then.
+  void PutEnd();
+
+  bool IsComplete() const noexcept { return m_stage == Stage::COMPLETE; }
+
+  /// What was read; once, when complete.
+  ResponseData Take();
+
+private:
+  enum class Stage { HEADER, BODY_OF_LENGTH, BODY_IN_CHUNKS, BODY_TO_END, COMPLETE };
+
+  std::size_t PutHeader(std::string_view bytes);
+  std::size_t PutBody(std::string_view bytes);
+  void FinishHeader();
+  void ChooseBody();
+  void CheckContentCoding() const;
+
+  const bool m_answersHead;
+  Stage m_stage = Stage::HEADER;
+  std::unique_ptr<ResponseHeaderParser> m_header;
+  std::string m_pendingHeader; // bytes that the parser wants to see again, with more
+  std::size_t m_headerBytes = 0;
+  int m_interimResponses = 0;
+  std::size_t m_length = 0; // of the body, when it is known
+  ChunkedBodyDecoder m_chunks;
+  ResponseData m_data;
+};
+
+} // namespace Tarvel::Http

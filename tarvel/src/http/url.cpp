@@ -1,0 +1,221 @@
+// SPDX-License-Identifier: Apache-2.0
+
+#include <tarvel/http/url.h>
+
+#include "http/header_syntax.h"
+
+#include <libxml/uri.h>
+
+#include <algorithm>
+#include <arpa/inet.h>
+#include <memory>
+
+namespace Tarvel {
+namespace Http {
+
+TARVEL_DEFINE_EXCEPTION(MalformedURLException)
+
+namespace {
+
+constexpr int HTTP_PORT = 80;
+constexpr int HTTPS_PORT = 443;
+constexpr int MAX_PORT = 65535;
+constexpr std::size_t MAX_HOST_LENGTH = 253; // RFC 1035, section 2.3.4, without the root's dot
+constexpr std::size_t MAX_LABEL_LENGTH = 63;
+constexpr std::size_t MAX_QUOTED_LENGTH = 200; // of a URL in a message
+
+struct UriDeleter {
+  void operator()(xmlURI *uri) const { xmlFreeURI(uri); }
+};
+using UriHandle = std::unique_ptr<xmlURI, UriDeleter>;
+
+bool IsDigit(char c) noexcept {
+  return c >= '0' && c <= '9';
+}
+
+bool IsUrlCharacter(char c) noexcept {
+  return c > ' ' && c < 0x7F;
+}
+
+bool IsHostCharacter(char c) noexcept {
+  return IsDigit(c) || (c >= 'a' && c <= 'z') || (c >= 'A' && c <= 'Z') || c == '-' || c == '_';
+}
+
+/// The authority as it is written: what stands between "//" and the path, the query or the fragment.
+std::string_view FindAuthority(std::string_view url) {
+  const std::size_t start = url.find("//");
+  if (start == std::string_view::npos) {
+    return {};
+  }
+  const std::string_view rest = url.substr(start + 2);
+  return rest.substr(0, rest.find_first_of("/?#"));
+}
+
+/// `url` as a message may show it: without user information, which may hold a password, on one line and not endless.
+std::string Quote(std::string_view url) {
+  std::string text(url);
+  const std::string_view authority = FindAuthority(url);
+  if (const std::size_t at = authority.rfind('@'); at != std::string_view::npos) {
+    text.replace(static_cast<std::size_t>(authority.data() - url.data()), at, "***");
+  }
+  std::replace_if(
+      text.begin(), text.end(), [](char c) { return IsControlCharacter(c); }, '?');
+  if (text.size() > MAX_QUOTED_LENGTH) {
+    text.resize(MAX_QUOTED_LENGTH);
+    text += "...";
+  }
+  return text;
+}
+
+[[noreturn]] void Refuse(std::string_view url, const std::string &reason) {
+  throw MalformedURLException("Malformed URL \"" + Quote(url) + "\": " + reason);
+}
+
+void CheckCharacters(std::string_view url) {
+  if (url.empty()) {
+    Refuse(url, "it is empty");
+  }
+  const std::string_view authority = FindAuthority(url);
+  if (std::any_of(authority.begin(), authority.end(), [](char c) { return static_cast<unsigned char>(c) > 0x7F; })) {
+    Refuse(url, "the host name is not ASCII (an internationalised name must be in its \"xn--\" form)");
+  }
+  if (!std::all_of(url.begin(), url.end(), IsUrlCharacter)) {
+    Refuse(url, "it holds a character that may not stand in a URL");
+  }
+}
+
+/// Path and query stay as they are written: unescaping would change what they mean.
+UriHandle Parse(std::string_view url) {
+  constexpr int RAW = 1;
+  UriHandle uri(xmlParseURIRaw(std::string(url).c_str(), RAW));
+  if (!uri) {
+    Refuse(url, "it does not have the form of a URL");
+  }
+  return uri;
+}
+
+bool IsSecureScheme(std::string_view url, const xmlURI &uri) {
+  const std::string_view scheme = uri.scheme ? uri.scheme : "";
+  if (EqualsIgnoringCase(scheme, "https")) {
+    return true;
+  }
+  if (!EqualsIgnoringCase(scheme, "http")) {
+    Refuse(url, "the scheme is not http or https");
+  }
+  return false;
+}
+
+/// Four numbers from 0 to 255, and nothing that the resolver would read in another way (octal, hexadecimal, fewer parts).
+bool IsIPv4Address(const std::string &host) {
+  in_addr address;
+  return inet_pton(AF_INET, host.c_str(), &address) == 1;
+}
+
+void CheckIPv6Address(std::string_view url, const std::string &host) {
+  in6_addr address;
+  if (inet_pton(AF_INET6, host.c_str(), &address) != 1) {
+    Refuse(url, "what stands in brackets is not an IPv6 address");
+  }
+}
+
+/// Why `label`, one part of a host name, is none; empty when it is.
+std::string RefuseLabel(std::string_view label) {
+  if (label.empty()) {
+    return "the host name has an empty part";
+  }
+  if (label.size() > MAX_LABEL_LENGTH) {
+    return "a part of the host name is longer than 63 characters";
+  }
+  if (!std::all_of(label.begin(), label.end(), IsHostCharacter)) {
+    return "the host name holds a character other than letters, digits, '-', '_' and '.'";
+  }
+  return {};
+}
+
+bool LooksLikeNumber(std::string_view label) {
+  return std::all_of(label.begin(), label.end(), IsDigit) || EqualsIgnoringCase(label.substr(0, 2), "0x");
+}
+
+void CheckHostName(std::string_view url, const std::string &host) {
+  std::string_view rest = host;
+  if (rest.size() > 1 && rest.back() == '.') {
+    rest.remove_suffix(1); // the root
+  }
+  if (rest.size() > MAX_HOST_LENGTH) {
+    Refuse(url, "the host name is longer than 253 characters");
+  }
+  std::string_view label;
+  for (bool isLast = false; !isLast;) {
+    const std::size_t dot = rest.find('.');
+    isLast = dot == std::string_view::npos;
+    label = rest.substr(0, dot);
+    if (const std::string refusal = RefuseLabel(label); !refusal.empty()) {
+      Refuse(url, refusal);
+    }
+    rest.remove_prefix(isLast ? rest.size() : dot + 1);
+  }
+  if (LooksLikeNumber(label) && !IsIPv4Address(host)) {
+    Refuse(url, "the host is not a complete IPv4 address");
+  }
+}
+
+int ParsePort(std::string_view url, std::string_view text) {
+  int port = 0;
+  for (const char c : text) {
+    if (!IsDigit(c)) {
+      Refuse(url, "the port is not a number");
+    }
+    port = port * 10 + (c - '0');
+    if (port > MAX_PORT) {
+      break;
+    }
+  }
+  if (port < 1 || port > MAX_PORT) {
+    Refuse(url, "the port is not between 1 and 65535");
+  }
+  return port;
+}
+
+/// Takes "host", "host:port", "[address]" or "[address]:port" apart.
+void ParseAuthority(std::string_view url, int defaultPort, std::string &host, int &port) {
+  const std::string_view authority = FindAuthority(url);
+  if (authority.find('@') != std::string_view::npos) {
+    Refuse(url, "it holds user information");
+  }
+  const bool isBracketed = !authority.empty() && authority.front() == '[';
+  const std::size_t hostEnd = isBracketed ? authority.find(']') + 1 : std::min(authority.find(':'), authority.size());
+  host = std::string(authority.substr(0, hostEnd));
+  if (host.empty()) {
+    Refuse(url, "the host is missing");
+  }
+  if (isBracketed) {
+    host = host.substr(1, host.size() - 2);
+    CheckIPv6Address(url, host);
+  } else {
+    CheckHostName(url, host);
+  }
+  const std::string_view rest = authority.substr(hostEnd);
+  port = rest.empty() ? defaultPort : ParsePort(url, rest.substr(1));
+}
+
+} // namespace
+
+void ParseHttpURL(std::string_view url, bool &isSecure, std::string &host, int &port, std::string &path) {
+  CheckCharacters(url);
+  const UriHandle uri = Parse(url);
+  const bool secure = IsSecureScheme(url, *uri);
+  std::string foundHost;
+  int foundPort = 0;
+  ParseAuthority(url, secure ? HTTPS_PORT : HTTP_PORT, foundHost, foundPort);
+
+  path = uri->path && *uri->path ? uri->path : "/";
+  if (uri->query_raw) {
+    path.append("?").append(uri->query_raw);
+  }
+  isSecure = secure;
+  host = std::move(foundHost);
+  port = foundPort;
+}
+
+} // namespace Http
+} // namespace Tarvel

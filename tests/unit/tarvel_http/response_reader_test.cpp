@@ -1,0 +1,319 @@
+// SPDX-License-Identifier: Apache-2.0
+
+#include "http/response_reader.h"
+
+#include "support/throws_message.h"
+
+#include <gtest/gtest.h>
+
+#include <cstddef>
+#include <ostream>
+#include <string>
+#include <string_view>
+
+namespace Tarvel {
+namespace Http {
+namespace {
+
+/// Feeds `bytes` in pieces of `pieceLength` and then the end of the connection.
+ResponseData ReadWhole(std::string_view bytes, std::size_t pieceLength) {
+  ResponseReader reader;
+  for (std::size_t position = 0; position < bytes.size(); position += pieceLength) {
+    reader.Put(bytes.substr(position, pieceLength));
+  }
+  reader.PutEnd();
+  EXPECT_TRUE(reader.IsComplete());
+  return reader.Take();
+}
+
+constexpr std::size_t WHOLE = 1 << 30;
+
+struct GoodResponse {
+  std::string bytes;
+  int status;
+  std::string reason;
+  std::string body;
+};
+
+void PrintTo(const GoodResponse &good, std::ostream *out) {
+  *out << testing::PrintToString(good.bytes);
+}
+
+class ResponseReaderAccepts : public testing::TestWithParam<GoodResponse> {};
+
+TEST_P(ResponseReaderAccepts, InPiecesOfAnyLength) {
+  const GoodResponse &expected = GetParam();
+  for (const std::size_t length : {WHOLE, std::size_t(1), std::size_t(2), std::size_t(7)}) {
+    const ResponseData response = ReadWhole(expected.bytes, length);
+    EXPECT_EQ(response.status, expected.status) << length;
+    EXPECT_EQ(response.reason, expected.reason) << length;
+    EXPECT_EQ(response.body, expected.body) << length;
+  }
+}
+
+const std::string OK = "HTTP/1.1 200 OK\r\n";
+const std::string CHUNKED = OK + "Transfer-Encoding: chunked\r\n\r\n";
+const std::string LENGTH_5 = OK + "Content-Length: 5\r\n\r\n";
+
+INSTANTIATE_TEST_SUITE_P(
+    Framing, ResponseReaderAccepts,
+    testing::Values(GoodResponse{LENGTH_5 + "hello", 200, "OK", "hello"},
+                    GoodResponse{OK + "content-length:  5 \r\n\r\nhello", 200, "OK", "hello"},
+                    GoodResponse{OK + "Content-Length: 005\r\n\r\nhello", 200, "OK", "hello"},
+                    GoodResponse{OK + "Content-Length: 5\r\nContent-Length: 5\r\n\r\nhello", 200, "OK", "hello"},
+                    GoodResponse{OK + "Content-Length: 5, 5\r\n\r\nhello", 200, "OK", "hello"},
+                    GoodResponse{OK + "Content-Length: 0\r\n\r\n", 200, "OK", ""},
+                    GoodResponse{OK + "\r\nto the end", 200, "OK", "to the end"},
+                    GoodResponse{OK + "\r\n", 200, "OK", ""},
+                    GoodResponse{"HTTP/1.0 200 OK\r\n\r\nto the end", 200, "OK", "to the end"},
+                    GoodResponse{"HTTP/1.0 200 OK\r\nContent-Length: 5\r\n\r\nhello", 200, "OK", "hello"},
+                    GoodResponse{CHUNKED + "5\r\nhello\r\n0\r\n\r\n", 200, "OK", "hello"},
+                    GoodResponse{CHUNKED + "2\r\nhe\r\n3\r\nllo\r\n0\r\n\r\n", 200, "OK", "hello"},
+                    GoodResponse{CHUNKED + "0\r\n\r\n", 200, "OK", ""},
+                    GoodResponse{CHUNKED + "0000005\r\nhello\r\n000\r\n\r\n", 200, "OK", "hello"},
+                    GoodResponse{CHUNKED + "A\r\n0123456789\r\n0\r\n\r\n", 200, "OK", "0123456789"},
+                    GoodResponse{CHUNKED + "a\r\n01234\r\n789\r\n0\r\n\r\n", 200, "OK", "01234\r\n789"},
+                    GoodResponse{CHUNKED + "5;name=value\r\nhello\r\n0;x\r\n\r\n", 200, "OK", "hello"},
+                    GoodResponse{CHUNKED + "5 ;\t\"quoted\"\r\nhello\r\n0\r\n\r\n", 200, "OK", "hello"},
+                    GoodResponse{CHUNKED + "5\r\nhello\r\n0\r\nTrailer: x\r\nContent-Length: 9\r\n\r\n", 200, "OK",
+                                 "hello"},
+                    GoodResponse{OK + "transfer-encoding: Chunked\r\n\r\n0\r\n\r\n", 200, "OK", ""}));
+
+INSTANTIATE_TEST_SUITE_P(
+    Statuses, ResponseReaderAccepts,
+    testing::Values(GoodResponse{"HTTP/1.1 204 No Content\r\n\r\n", 204, "No Content", ""},
+                    GoodResponse{"HTTP/1.1 204 No Content\r\nContent-Length: 5\r\n\r\n", 204, "No Content", ""},
+                    GoodResponse{"HTTP/1.1 304 Not Modified\r\nContent-Length: 5\r\n\r\n", 304, "Not Modified", ""},
+                    GoodResponse{"HTTP/1.1 404 \r\nContent-Length: 0\r\n\r\n", 404, "", ""},
+                    GoodResponse{"HTTP/1.1 500 Internal Server Error\r\nContent-Length: 1\r\n\r\nx", 500,
+                                 "Internal Server Error", "x"},
+                    GoodResponse{"HTTP/1.1 999 Odd\r\nContent-Length: 0\r\n\r\n", 999, "Odd", ""},
+                    GoodResponse{"HTTP/1.1 101 Switching Protocols\r\nUpgrade: x\r\n\r\n\x01\x02", 101,
+                                 "Switching Protocols", ""},
+                    GoodResponse{"HTTP/1.1 100 Continue\r\n\r\n" + LENGTH_5 + "hello", 200, "OK", "hello"},
+                    GoodResponse{"HTTP/1.1 100 Continue\r\n\r\nHTTP/1.1 103 Early Hints\r\nLink: x\r\n\r\n"
+                                 "HTTP/1.1 404 Not Found\r\nContent-Length: 0\r\n\r\n",
+                                 404, "Not Found", ""},
+                    GoodResponse{OK + "Content-Encoding: identity\r\nContent-Length: 1\r\n\r\nx", 200, "OK", "x"},
+                    GoodResponse{OK + "Content-Encoding:\r\nContent-Length: 1\r\n\r\nx", 200, "OK", "x"},
+                    GoodResponse{OK + "Content-Encoding: gzip\r\nContent-Length: 0\r\n\r\n", 200, "OK", ""}));
+
+struct BadResponse {
+  std::string bytes;
+  std::string message;
+};
+
+void PrintTo(const BadResponse &bad, std::ostream *out) {
+  *out << testing::PrintToString(bad.bytes.substr(0, 200));
+}
+
+class ResponseReaderRefuses : public testing::TestWithParam<BadResponse> {};
+
+TEST_P(ResponseReaderRefuses, InPiecesOfAnyLength) {
+  const BadResponse &bad = GetParam();
+  for (const std::size_t length : {WHOLE, std::size_t(1), std::size_t(5)}) {
+    EXPECT_THROWS_MESSAGE(ReadWhole(bad.bytes, length), HttpException, bad.message) << length;
+  }
+}
+
+std::string NoHttp(const std::string &reason) {
+  return "its header is not HTTP/1.x (" + reason + ")";
+}
+
+const std::string IN_HEADER = "the connection ended within its header";
+
+INSTANTIATE_TEST_SUITE_P(
+    NotHttp, ResponseReaderRefuses,
+    testing::Values(BadResponse{"", "the connection ended before it"}, BadResponse{"H", IN_HEADER},
+                    BadResponse{"HTTP/1.1 200 OK", IN_HEADER}, BadResponse{"HTTP/1.1 200 OK\r\n", IN_HEADER},
+                    BadResponse{"HTTP/1.1 200 OK\r\nContent-Length: 5\r\n", IN_HEADER},
+                    BadResponse{"HTTP/1.1 100 Continue\r\n\r\n", IN_HEADER},
+                    BadResponse{"SSH-2.0-OpenSSH_9.2p1\r\n", NoHttp("bad version")},
+                    BadResponse{"HTTP/2.0 200 OK\r\n\r\n", NoHttp("bad version")},
+                    BadResponse{"HTTP/0.9 200 OK\r\n\r\n", NoHttp("bad version")},
+                    BadResponse{"HTTP/1.2 200 OK\r\n\r\n", NoHttp("bad version")},
+                    BadResponse{"ICY 200 OK\r\n\r\n", NoHttp("bad version")},
+                    BadResponse{"<html><body>not HTTP at all</body></html>", NoHttp("bad version")},
+                    BadResponse{"\x15\x03\x03\x00\x02\x02\x28 and more", NoHttp("bad version")},
+                    BadResponse{"\r\n" + LENGTH_5 + "hello", NoHttp("bad version")},
+                    BadResponse{"HTTP/1.1 20 OK\r\n\r\n", NoHttp("bad status")},
+                    BadResponse{"HTTP/1.1 000 OK\r\n\r\n", NoHttp("bad status")},
+                    BadResponse{"HTTP/1.1 099 OK\r\n\r\n", NoHttp("bad status")},
+                    BadResponse{"HTTP/1.1 2000 OK\r\n\r\n", NoHttp("bad status")},
+                    BadResponse{"HTTP/1.1 abc OK\r\n\r\n", NoHttp("bad status")},
+                    BadResponse{"HTTP/1.1 -20 OK\r\n\r\n", NoHttp("bad status")},
+                    BadResponse{"HTTP/1.1 200 O\x01K\r\n\r\n", NoHttp("bad reason")},
+                    BadResponse{"HTTP/1.1 200 OK\n\n\r\n\r\n", NoHttp("bad reason")},
+                    BadResponse{OK + "No colon\r\n\r\n", NoHttp("bad field")},
+                    BadResponse{OK + "Space : x\r\n\r\n", NoHttp("bad field")},
+                    BadResponse{OK + ": x\r\n\r\n", NoHttp("bad field")},
+                    BadResponse{OK + "A: b\x01\r\n\r\n", NoHttp("bad value")},
+                    BadResponse{OK + std::string("A: b\0c\r\n\r\n", 10), NoHttp("bad value")}));
+
+INSTANTIATE_TEST_SUITE_P(
+    Lengths, ResponseReaderRefuses,
+    testing::Values(
+        BadResponse{LENGTH_5 + "hell", "the connection ended after 4 of the body's 5 bytes"},
+        BadResponse{LENGTH_5, "the connection ended after 0 of the body's 5 bytes"},
+        BadResponse{OK + "Content-Length: -5\r\n\r\nhello", NoHttp("bad Content-Length")},
+        BadResponse{OK + "Content-Length: +5\r\n\r\nhello", NoHttp("bad Content-Length")},
+        BadResponse{OK + "Content-Length: 0x5\r\n\r\nhello", NoHttp("bad Content-Length")},
+        BadResponse{OK + "Content-Length: 5.0\r\n\r\nhello", NoHttp("bad Content-Length")},
+        BadResponse{OK + "Content-Length: five\r\n\r\nhello", NoHttp("bad Content-Length")},
+        BadResponse{OK + "Content-Length:\r\n\r\nhello", NoHttp("bad Content-Length")},
+        BadResponse{OK + "Content-Length: 5 5\r\n\r\nhello", NoHttp("bad Content-Length")},
+        BadResponse{OK + "Content-Length: 99999999999999999999\r\n\r\n", NoHttp("bad Content-Length")},
+        BadResponse{OK + "Content-Length: 5\r\nContent-Length: 6\r\n\r\nhello", NoHttp("multiple Content-Length")},
+        BadResponse{OK + "Content-Length: 5, 6\r\n\r\nhello", NoHttp("multiple Content-Length")},
+        BadResponse{OK + "Content-Length: 16777217\r\n\r\n", "the body is longer than 16777216 bytes"},
+        BadResponse{OK + "Content-Length: 5\r\nTransfer-Encoding: chunked\r\n\r\n0\r\n\r\n",
+                    NoHttp("bad Transfer-Encoding")},
+        BadResponse{OK + "Transfer-Encoding: chunked\r\nContent-Length: 5\r\n\r\n0\r\n\r\n",
+                    NoHttp("bad Content-Length")},
+        BadResponse{OK + "Transfer-Encoding: identity\r\nContent-Length: 5\r\n\r\nhello",
+                    "it has both a Content-Length and a Transfer-Encoding"},
+        BadResponse{OK + "Transfer-Encoding: gzip\r\n\r\nhello", "its Transfer-Encoding is not \"chunked\""},
+        BadResponse{OK + "Transfer-Encoding: gzip, chunked\r\n\r\n0\r\n\r\n",
+                    "its Transfer-Encoding is not \"chunked\""},
+        BadResponse{OK + "Transfer-Encoding: chunked, gzip\r\n\r\n0\r\n\r\n",
+                    "its Transfer-Encoding is not \"chunked\""},
+        BadResponse{OK + "Transfer-Encoding: gzip\r\nTransfer-Encoding: chunked\r\n\r\n0\r\n\r\n",
+                    "its Transfer-Encoding is not \"chunked\""},
+        BadResponse{OK + "Transfer-Encoding: chunked\r\nTransfer-Encoding: chunked\r\n\r\n0\r\n\r\n",
+                    NoHttp("bad Transfer-Encoding")},
+        BadResponse{OK + "Transfer-Encoding: xchunked\r\n\r\n0\r\n\r\n", "its Transfer-Encoding is not \"chunked\""},
+        BadResponse{"HTTP/1.0 200 OK\r\nTransfer-Encoding: chunked\r\n\r\n0\r\n\r\n",
+                    "it has a Transfer-Encoding, which HTTP/1.0 does not know"},
+        BadResponse{"HTTP/1.1 204 No Content\r\nContent-Length: 1\r\nTransfer-Encoding: chunked\r\n\r\n",
+                    NoHttp("bad Transfer-Encoding")}));
+
+const std::string BROKEN = "the chunked body is broken: ";
+const std::string NO_SIZE = BROKEN + "a chunk without a size";
+const std::string NO_NUMBER = BROKEN + "a size that is not a hexadecimal number";
+const std::string NO_LINE_FEED = BROKEN + "a carriage return without a line feed";
+const std::string TOO_LONG = BROKEN + "a chunk longer than its size";
+const std::string CONTROL = BROKEN + "a control character in an extension or the trailer";
+const std::string CUT = "the connection ended within the chunked body";
+
+INSTANTIATE_TEST_SUITE_P(
+    Chunks, ResponseReaderRefuses,
+    testing::Values(
+        BadResponse{CHUNKED, CUT}, BadResponse{CHUNKED + "5", CUT}, BadResponse{CHUNKED + "5\r\nhel", CUT},
+        BadResponse{CHUNKED + "5\r\nhello", CUT}, BadResponse{CHUNKED + "5\r\nhello\r\n", CUT},
+        BadResponse{CHUNKED + "5\r\nhello\r\n0\r\n", CUT}, BadResponse{CHUNKED + "0\r\n\r", CUT},
+        BadResponse{CHUNKED + "0\r\nTrailer: x\r\n", CUT}, BadResponse{CHUNKED + "\r\n", NO_SIZE},
+        BadResponse{CHUNKED + "hello", NO_SIZE}, BadResponse{CHUNKED + "-5\r\n", NO_SIZE},
+        BadResponse{CHUNKED + " 5\r\nhello", NO_SIZE}, BadResponse{CHUNKED + ";x\r\n", NO_SIZE},
+        BadResponse{CHUNKED + "0x5\r\nhello", NO_NUMBER}, BadResponse{CHUNKED + "5g\r\nhello", NO_NUMBER},
+        BadResponse{CHUNKED + "5\nhello\r\n0\r\n\r\n", NO_NUMBER}, BadResponse{CHUNKED + "5\rhello", NO_LINE_FEED},
+        BadResponse{CHUNKED + "5\r\nhello\rX", NO_LINE_FEED},
+        BadResponse{CHUNKED + "4\r\nhello\r\n0\r\n\r\n", TOO_LONG},
+        BadResponse{CHUNKED + "6\r\nhello\r\n0\r\n\r\n", TOO_LONG}, BadResponse{CHUNKED + "5;a\nb\r\nhello", CONTROL},
+        BadResponse{CHUNKED + "0\r\nA: b\nC: d\r\n", CONTROL}, BadResponse{CHUNKED + "0\r\n\rX", NO_LINE_FEED},
+        BadResponse{CHUNKED + "0\r\nA\rX", NO_LINE_FEED},
+        BadResponse{CHUNKED + "1000001\r\n", "the body is longer than 16777216 bytes"},
+        BadResponse{CHUNKED + "1\r\nx\r\n1000000\r\n", "the body is longer than 16777216 bytes"},
+        BadResponse{CHUNKED + "ffffffffffffffff\r\n", "the body is longer than 16777216 bytes"},
+        BadResponse{CHUNKED + "10000000000000000000000000000000005\r\nhello", "the body is longer than 16777216 bytes"},
+        BadResponse{CHUNKED + "1;" + std::string(65537, 'x'),
+                    "the extensions and the trailer of the chunked body are longer than 65536 bytes"},
+        BadResponse{CHUNKED + std::string(65537, '0'),
+                    "the extensions and the trailer of the chunked body are longer than 65536 bytes"},
+        BadResponse{CHUNKED + "0\r\n" + std::string(65537, 'x'),
+                    "the extensions and the trailer of the chunked body are longer than 65536 bytes"}));
+
+std::string Repeat(const std::string &text, int times) {
+  std::string all;
+  for (int i = 0; i < times; ++i) {
+    all += text;
+  }
+  return all;
+}
+
+const std::string HEADER_LIMIT = "the header is longer than 65536 bytes";
+
+INSTANTIATE_TEST_SUITE_P(
+    Limits, ResponseReaderRefuses,
+    testing::Values(
+        BadResponse{OK + "A: " + std::string(65536, 'x') + "\r\n\r\n", HEADER_LIMIT},
+        BadResponse{OK + Repeat("A: b\r\n", 20000) + "\r\n", HEADER_LIMIT},
+        BadResponse{"HTTP/1.1 200 " + std::string(65536, 'x') + "\r\n\r\n", HEADER_LIMIT},
+        BadResponse{Repeat("HTTP/1.1 100 Continue\r\n\r\n", 17), "it follows more than 16 interim responses"},
+        BadResponse{Repeat("HTTP/1.1 100 Continue\r\nA: " + std::string(10000, 'x') + "\r\n\r\n", 8), HEADER_LIMIT}));
+
+INSTANTIATE_TEST_SUITE_P(
+    Encodings, ResponseReaderRefuses,
+    testing::Values(BadResponse{OK + "Content-Encoding: gzip\r\nContent-Length: 3\r\n\r\n\x1f\x8b\x08",
+                                "its content (status 200 OK) is encoded as \"gzip\", which was not asked for"},
+                    BadResponse{OK + "content-encoding: br\r\nTransfer-Encoding: chunked\r\n\r\n0\r\n\r\n",
+                                "its content (status 200 OK) is encoded as \"br\", which was not asked for"},
+                    BadResponse{
+                        "HTTP/1.1 404 Not Found\r\nContent-Encoding: deflate\r\nContent-Length: 1\r\n\r\nx",
+                        "its content (status 404 Not Found) is encoded as \"deflate\", which was not asked for"}));
+
+TEST(ResponseReader, RefusesBytesAfterTheEndAsFarAsTheyHaveCome) {
+  for (const std::string &bytes :
+       {LENGTH_5 + "hello!", std::string("HTTP/1.1 204 No Content\r\n\r\nhello"), CHUNKED + "0\r\n\r\nx",
+        LENGTH_5 + "hello" + LENGTH_5 + "world", OK + "Content-Length: 0\r\n\r\nx"}) {
+    ResponseReader reader;
+    EXPECT_THROWS_MESSAGE(reader.Put(bytes), HttpException, "it goes on after its end") << bytes;
+  }
+}
+
+TEST(ResponseReader, NeverTakesAPrefixOfAResponseWithALengthForTheWhole) {
+  for (const std::string &bytes : {LENGTH_5 + "hello", CHUNKED + "2;x=y\r\nhe\r\n3\r\nllo\r\n0\r\nTrailer: x\r\n\r\n",
+                                   "HTTP/1.1 100 Continue\r\n\r\n" + LENGTH_5 + "hello"}) {
+    EXPECT_EQ(ReadWhole(bytes, WHOLE).body, "hello");
+    for (std::size_t length = 0; length < bytes.size(); ++length) {
+      EXPECT_THROW(ReadWhole(bytes.substr(0, length), WHOLE), HttpException) << length;
+    }
+  }
+}
+
+TEST(ResponseReader, KeepsTheFieldsInTheirOrderAndDropsTheTrailers) {
+  const ResponseData response =
+      ReadWhole(OK + "Set-Cookie: a=b\r\nSET-COOKIE: c=d\r\nFolded: one\r\n two\r\nTransfer-Encoding: chunked\r\n\r\n"
+                     "0\r\nSet-Cookie: e=f\r\n\r\n",
+                WHOLE);
+  const HeaderFields expected{
+      {"Set-Cookie", "a=b"}, {"SET-COOKIE", "c=d"}, {"Folded", "one two"}, {"Transfer-Encoding", "chunked"}};
+  EXPECT_EQ(response.fields, expected);
+}
+
+TEST(ResponseReader, TakesAHeaderAndABodyOfExactlyTheLimits) {
+  const std::string start = OK + "Content-Length: 16777216\r\nA: ";
+  const std::string header = start + std::string(MAX_HEADER_BYTES - start.size() - 4, 'x') + "\r\n\r\n";
+  ASSERT_EQ(header.size(), MAX_HEADER_BYTES);
+  EXPECT_EQ(ReadWhole(header + std::string(MAX_BODY_BYTES, 'x'), 16384).body.size(), MAX_BODY_BYTES);
+}
+
+TEST(ResponseReader, RefusesABodyToTheEndOfTheConnectionOnceItIsOverTheLimit) {
+  ResponseReader reader;
+  reader.Put(OK + "\r\n");
+  reader.Put(std::string(MAX_BODY_BYTES, 'x'));
+  EXPECT_THROWS_MESSAGE(reader.Put("x"), HttpException, "the body is longer than 16777216 bytes");
+}
+
+TEST(ResponseReader, RefusesEndlessChunksAtTheLimit) {
+  ResponseReader reader;
+  reader.Put(CHUNKED);
+  std::size_t total = 0;
+  const std::string chunk = "10000\r\n" + std::string(65536, 'x') + "\r\n";
+  const auto feed = [&] {
+    for (; total < 2 * MAX_BODY_BYTES; total += 65536) {
+      reader.Put(chunk);
+    }
+  };
+  EXPECT_THROWS_MESSAGE(feed(), HttpException, "the body is longer than 16777216 bytes");
+  EXPECT_EQ(total, MAX_BODY_BYTES);
+}
+
+TEST(ResponseReader, ExpectsNoBodyForAnAnswerToHead) {
+  ResponseReader reader(true);
+  reader.Put(LENGTH_5);
+  EXPECT_TRUE(reader.IsComplete());
+}
+
+} // namespace
+} // namespace Http
+} // namespace Tarvel
