@@ -2,6 +2,8 @@
 
 #include "ssl/session_cache.h"
 
+#include "crypto/openssl_use.h"
+
 #include <ctime>
 #include <iterator>
 #include <utility>
@@ -57,6 +59,13 @@ SessionHandle SessionCache::Take(const std::string &key) {
     }
   }
   return {};
+}
+
+void SessionCache::Abandon() noexcept {
+  const std::lock_guard<std::mutex> lock(m_mutex);
+  for (Entry &entry : m_entries) {
+    Crypto::OpenSslUse::Abandon(entry.session.release());
+  }
 }
 
 std::size_t SessionCache::GetSize() const {

@@ -31,6 +31,9 @@ public:
 
   void Clear();
 
+  /// Forgets the sessions without freeing them, once OpenSSL is gone.
+  void Abandon() noexcept;
+
   std::size_t GetSize() const;
 
 private:

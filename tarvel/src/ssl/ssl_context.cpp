@@ -4,6 +4,7 @@
 
 #include "crypto/certificate_impl.h"
 #include "crypto/openssl_errors.h"
+#include "crypto/openssl_use.h"
 #include "crypto/private_key_impl.h"
 #include "ssl/ssl_context_impl.h"
 #include "ssl/ssl_stream_impl.h"
@@ -46,6 +47,7 @@ SSLStream::~SSLStream() = default;
 SSLContext::~SSLContext() = default;
 
 SSLContextImpl::SSLContextImpl() {
+  Crypto::OpenSslUse::Prepare();
   const Crypto::OpenSslErrorScope errors;
   m_native.reset(SSL_CTX_new(TLS_client_method()));
   if (!m_native) {
@@ -62,6 +64,17 @@ SSLContextImpl::SSLContextImpl() {
   X509_VERIFY_PARAM_set_flags(SSL_CTX_get0_param(native), X509_V_FLAG_PARTIAL_CHAIN);
   SSL_CTX_set_session_cache_mode(native, SSL_SESS_CACHE_CLIENT | SSL_SESS_CACHE_NO_INTERNAL);
   SSL_CTX_sess_set_new_cb(native, SSLStreamImpl::OnNewSession);
+}
+
+SSLContextImpl::~SSLContextImpl() {
+  const Crypto::OpenSslUse use;
+  if (!use) {
+    m_sessions.Abandon();
+    Crypto::OpenSslUse::Abandon(m_native.release());
+    return;
+  }
+  m_sessions.Clear();
+  m_native.reset();
 }
 
 // Not by OpenSSL's default paths: these can be bent by environment variables.

@@ -30,7 +30,7 @@ public:
   SessionCache &GetSessions() noexcept { return m_sessions; }
 
 private:
-  ~SSLContextImpl() override = default;
+  ~SSLContextImpl() override;
 
   ContextHandle m_native;
   SessionCache m_sessions;

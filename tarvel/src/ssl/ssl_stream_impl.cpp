@@ -3,6 +3,7 @@
 #include "ssl/ssl_stream_impl.h"
 
 #include "crypto/openssl_errors.h"
+#include "crypto/openssl_use.h"
 #include "system/io_engine.h"
 #include "system/uncaught_exception.h"
 
@@ -101,6 +102,11 @@ SSLStreamImpl::SSLStreamImpl(const Ref<SSLContextImpl> &context, const Ref<Syste
     : m_context(context), m_lower(stream), m_endpoint(endpoint), m_host(endpoint) {}
 
 SSLStreamImpl::~SSLStreamImpl() {
+  const Crypto::OpenSslUse use;
+  if (!use) {
+    Crypto::OpenSslUse::Abandon(m_connection.release());
+    return;
+  }
   const Crypto::OpenSslErrorScope errors;
   if (m_connection && m_stage == Stage::ESTABLISHED) {
     // Else OpenSSL takes the connection for a broken one and its session for no longer resumable.
@@ -148,7 +154,7 @@ void SSLStreamImpl::AsyncWrite(const char *bytes, std::size_t length, TransferHa
 void SSLStreamImpl::Close() noexcept {
   try {
     auto done = std::make_shared<Completions>();
-    {
+    if (const Crypto::OpenSslUse use; use) {
       const std::lock_guard<std::mutex> lock(m_mutex);
       if (m_stage == Stage::ESTABLISHED && !m_lowerWrites) {
         const Crypto::OpenSslErrorScope errors;
@@ -175,7 +181,7 @@ void SSLStreamImpl::PostPump() {
 
 void SSLStreamImpl::PumpOnce() {
   Completions done;
-  {
+  if (const Crypto::OpenSslUse use; use) {
     const std::lock_guard<std::mutex> lock(m_mutex);
     Pump(done);
   }
@@ -373,7 +379,7 @@ void SSLStreamImpl::StartLowerRead() {
       m_lowerInput.data(), m_lowerInput.size(), [self = Ref(this)](std::size_t count, const Exception *exception) {
         auto proceed = [self, count, failure = exception ? LowerFailure(exception->what()) : LowerFailure()] {
           Completions done;
-          {
+          if (const Crypto::OpenSslUse use; use) {
             const std::lock_guard<std::mutex> lock(self->m_mutex);
             self->OnLowerRead(count, failure, done);
           }
@@ -415,7 +421,7 @@ void SSLStreamImpl::StartLowerWrite() {
                       [self = Ref(this)](std::size_t, const Exception *exception) {
                         auto proceed = [self, failure = exception ? LowerFailure(exception->what()) : LowerFailure()] {
                           Completions done;
-                          {
+                          if (const Crypto::OpenSslUse use; use) {
                             const std::lock_guard<std::mutex> lock(self->m_mutex);
                             self->OnLowerWritten(failure, done);
                           }

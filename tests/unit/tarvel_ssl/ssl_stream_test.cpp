@@ -11,6 +11,7 @@
 #include <openssl/err.h>
 #include <openssl/ssl.h>
 
+#include <cstdlib>
 #include <future>
 #include <string>
 #include <vector>
@@ -141,12 +142,14 @@ TEST(SSLStream, ClosingSendsTheClosingNotice) {
   ScriptedServer server(
       [&](ServerConnection &connection) {
         connection.ShakeHands();
+        connection.Write("x");
         connection.ReadSome();
         noticed.set_value(connection.ReceivedClosingNotice());
       },
       TlsSettings());
   TlsClient client(CreateTrustingContext(), server.GetPort());
   ASSERT_EQ(client.ShakeHands(), "");
+  EXPECT_EQ(client.Read(), "x"); // what lies unread at the end would make the kernel send a reset
   client.GetStream()->Close();
   EXPECT_TRUE(noticed.get_future().get());
 }
@@ -357,6 +360,36 @@ TEST(SSLStream, ManyConnectionsAtOnce) {
     thread.join();
   }
   EXPECT_EQ(right, 80);
+}
+
+/// Ends the process while handshakes go on. The server uses no OpenSSL, which would have to survive just the same.
+void EndWhileBusy() {
+  auto *const server = new ScriptedServer([](ServerConnection &connection) {
+    connection.ReadRawSome();
+    connection.Reset();
+  });
+  const Ref<SSLContext> context = CreateTrustingContext();
+  static std::atomic<int> attempts{0};
+  for (int t = 0; t < 4; ++t) {
+    std::thread([context, port = server->GetPort()] {
+      for (;; ++attempts) {
+        try {
+          TlsClient(context, port).ShakeHands();
+        } catch (const std::exception &) {
+          // The server resets connections at will.
+        }
+      }
+    }).detach();
+  }
+  Testing::Eventually([] { return attempts > 20; });
+  std::exit(0);
+}
+
+TEST(SSLStreamDeathTest, TheProcessMayEndWhileHandshakesGoOn) {
+  testing::FLAGS_gtest_death_test_style = "threadsafe";
+  for (int i = 0; i < 20; ++i) {
+    ASSERT_EXIT(EndWhileBusy(), testing::ExitedWithCode(0), "") << i;
+  }
 }
 
 } // namespace
