@@ -5,9 +5,6 @@
 
 #include <tarvel/xml/security/key_info_resolver.h>
 
-#include <algorithm>
-#include <iterator>
-
 namespace SsoClient {
 
 namespace {
@@ -20,10 +17,7 @@ using Tarvel::Xml::Security::KeyInfoResolver;
 
 /// Resolves keys from `trusted` alone; null references trust nothing.
 Ref<KeyInfoResolver> ResolverFor(const CertificateList &trusted) {
-  CertificateList certificates;
-  std::copy_if(trusted.begin(), trusted.end(), std::back_inserter(certificates),
-               [](const Ref<const Certificate> &certificate) { return static_cast<bool>(certificate); });
-  return Tarvel::Xml::Security::CreateTrustSetKeyResolver(certificates);
+  return Tarvel::Xml::Security::CreateTrustSetKeyResolver(trusted);
 }
 
 } // namespace

@@ -17,12 +17,6 @@ namespace {
 
 constexpr std::size_t MAX_KEY_INFO_CERTIFICATES = 16; // further ones are not compared
 
-/// A trusted certificate and the Base64 form of its encoding. The form is unique, so comparing texts compares bytes.
-struct TrustedCertificate {
-  Ref<const Crypto::Certificate> certificate;
-  std::string base64;
-};
-
 /// Whether `text` is `base64` with white space between its characters.
 bool IsSpacedForm(std::string_view text, std::string_view base64) {
   std::size_t matched = 0;
@@ -61,45 +55,57 @@ std::vector<std::string_view> CertificateTexts(const ElementNode &keyInfo) {
   return texts;
 }
 
+/// The given certificates without nulls and repetitions, in their order.
+KeyInfoResolver::CertificateList DistinctCertificates(const KeyInfoResolver::CertificateList &certificates) {
+  KeyInfoResolver::CertificateList distinct;
+  distinct.reserve(certificates.size());
+  for (const Ref<const Crypto::Certificate> &certificate : certificates) {
+    const bool isKnown = std::any_of(distinct.begin(), distinct.end(), [&certificate](const auto &known) {
+      return !certificate || known->GetDer() == certificate->GetDer();
+    });
+    if (certificate && !isKnown) {
+      distinct.push_back(certificate);
+    }
+  }
+  return distinct;
+}
+
 class TrustSetKeyResolver final : public KeyInfoResolver {
 public:
-  explicit TrustSetKeyResolver(const CertificateList &trusted) {
-    for (const Ref<const Crypto::Certificate> &certificate : trusted) {
-      if (!certificate) {
-        continue;
-      }
-      std::string base64 = StringUtil::Base64Encode(certificate->GetDer());
-      const bool isKnown = std::any_of(m_trusted.begin(), m_trusted.end(),
-                                       [&base64](const TrustedCertificate &known) { return known.base64 == base64; });
-      if (!isKnown) {
-        m_all.push_back(certificate);
-        m_trusted.push_back({certificate, std::move(base64)});
-      }
+  explicit TrustSetKeyResolver(const CertificateList &trusted) : m_trusted(DistinctCertificates(trusted)) {
+    if (m_trusted.size() < 2) {
+      return; // there is nothing to choose from
+    }
+    m_base64.reserve(m_trusted.size());
+    for (const Ref<const Crypto::Certificate> &certificate : m_trusted) {
+      m_base64.push_back(StringUtil::Base64Encode(certificate->GetDer()));
     }
   }
 
   CertificateList Resolve(const ElementNode *keyInfo) const override {
     CertificateList named;
-    if (keyInfo && m_all.size() > 1) {
+    if (keyInfo && !m_base64.empty()) {
       for (const std::string_view text : CertificateTexts(*keyInfo)) {
         AddMatch(text, named);
       }
     }
-    return named.empty() ? m_all : named;
+    return named.empty() ? m_trusted : named;
   }
 
 private:
   void AddMatch(std::string_view text, CertificateList &named) const {
-    for (const TrustedCertificate &trusted : m_trusted) {
-      if (IsSpacedForm(text, trusted.base64) &&
-          std::find(named.begin(), named.end(), trusted.certificate) == named.end()) {
-        named.push_back(trusted.certificate);
+    for (std::size_t index = 0; index < m_base64.size(); ++index) {
+      if (IsSpacedForm(text, m_base64[index]) &&
+          std::find(named.begin(), named.end(), m_trusted[index]) == named.end()) {
+        named.push_back(m_trusted[index]);
       }
     }
   }
 
-  CertificateList m_all;
-  std::vector<TrustedCertificate> m_trusted;
+  const CertificateList m_trusted;
+  // The Base64 form of each trusted certificate, which is unique, so that comparing texts compares bytes; none when there
+  // are fewer than two certificates.
+  std::vector<std::string> m_base64;
 };
 
 } // namespace
