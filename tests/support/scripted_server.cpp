@@ -380,4 +380,44 @@ UnusedPort::~UnusedPort() {
   ::close(m_descriptor);
 }
 
+FullPort::FullPort() : m_listener(BindLoopback(false, m_port)) {
+  Require(::listen(m_listener, 0) == 0, "cannot listen");
+  sockaddr_storage address{};
+  socklen_t length = sizeof address;
+  Require(::getsockname(m_listener, reinterpret_cast<sockaddr *>(&address), &length) == 0, "no address");
+  constexpr int FILLERS = 8;
+  for (int i = 0; i < FILLERS; ++i) {
+    const int filler = ::socket(AF_INET, SOCK_STREAM | SOCK_CLOEXEC | SOCK_NONBLOCK, 0);
+    ::connect(filler, reinterpret_cast<const sockaddr *>(&address), length);
+    m_fillers.push_back(filler);
+  }
+}
+
+FullPort::~FullPort() {
+  Empty();
+  ::close(m_listener);
+}
+
+void FullPort::Empty() {
+  for (const int filler : m_fillers) {
+    ::close(filler);
+  }
+  m_fillers.clear();
+  pollfd listener{m_listener, POLLIN, 0};
+  while (::poll(&listener, 1, 0) > 0) {
+    ::close(::accept4(m_listener, nullptr, nullptr, SOCK_CLOEXEC));
+  }
+}
+
+void FullPort::AnswerOne(std::string_view bytes) {
+  std::string request;
+  while (request.empty()) {
+    ServerConnection connection(::accept4(m_listener, nullptr, nullptr, SOCK_CLOEXEC), nullptr);
+    request = connection.ReadRequest();
+    if (!request.empty()) {
+      connection.Write(bytes);
+    }
+  }
+}
+
 } // namespace Testing

@@ -16,6 +16,7 @@
 #include <string>
 #include <string_view>
 #include <thread>
+#include <vector>
 
 struct ssl_st;
 struct ssl_ctx_st;
@@ -150,6 +151,26 @@ public:
 private:
   int m_port = 0;        // before the descriptor, which sets it
   int m_descriptor = -1; // bound, and so nobody else's, but not listening
+};
+
+/// A port of 127.0.0.1 that takes no more connections: its queue is full, and nobody empties it. A connect gets no answer.
+class FullPort {
+public:
+  FullPort();
+  FullPort(const FullPort &) = delete;
+  FullPort &operator=(const FullPort &) = delete;
+  ~FullPort();
+  int GetPort() const noexcept { return m_port; }
+
+  /// Makes room in the queue. Whoever asks from now on gets an answer from `AnswerOne`.
+  void Empty();
+  /// Waits for a connection that sends a request, and answers it.
+  void AnswerOne(std::string_view bytes);
+
+private:
+  int m_port = 0; // before the listener, which sets it
+  int m_listener = -1;
+  std::vector<int> m_fillers;
 };
 
 } // namespace Testing

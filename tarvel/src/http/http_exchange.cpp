@@ -100,13 +100,25 @@ void HttpExchange::Send(const Ref<System::Stream> &stream) {
   m_message = Serialise(m_request, MakeHostHeader(*m_spec, m_isSecure),
                         m_cookies->GetHeader(m_spec->GetHost(), m_request.target, m_isSecure));
   SecureWipe(m_request.body);
-  // A write that fails is no news: the read, which ends as well then, tells what there is to tell.
-  stream->AsyncWrite(m_message.data(), m_message.size(),
-                     [self = Ref(this)](std::size_t, const Exception *) { self->OnWritten(); });
+  stream->AsyncWrite(m_message.data(), m_message.size(), [self = Ref(this)](std::size_t, const Exception *failure) {
+    self->Step([&self, failure] { self->OnWritten(failure); });
+  });
 }
 
-void HttpExchange::OnWritten() {
+/// A write that fails does not end the exchange: the read, which ends as well then, tells more.
+void HttpExchange::OnWritten(const Exception *failure) {
   SecureWipe(m_message);
+  std::shared_ptr<const Exception> writeFailure(failure ? failure->Clone() : nullptr);
+  bool endWaits = false;
+  {
+    const std::lock_guard<std::mutex> lock(m_mutex);
+    m_isWriteOver = true;
+    m_writeFailure = std::move(writeFailure);
+    endWaits = m_endWaitsForWrite;
+  }
+  if (endWaits) {
+    FinishEnd();
+  }
 }
 
 void HttpExchange::Read(const Ref<System::Stream> &stream) {
@@ -121,24 +133,53 @@ void HttpExchange::OnRead(std::size_t count, const Exception *failure) {
     Fail(*failure);
     return;
   }
-  try {
-    if (count == 0) {
-      m_reader.PutEnd();
-    } else {
-      m_reader.Put({m_buffer.data(), count});
-    }
-  } catch (const HttpException &exception) {
-    throw HttpException("Bad response from " + m_endpoint + ": " + exception.what());
-  }
-  if (!m_reader.IsComplete()) {
-    Ref<System::Stream> stream;
-    {
-      const std::lock_guard<std::mutex> lock(m_mutex);
-      stream = m_stream;
-    }
-    Read(stream);
+  if (count == 0) {
+    OnEnd();
     return;
   }
+  Judge([this, count] { m_reader.Put({m_buffer.data(), count}); });
+  if (m_reader.IsComplete()) {
+    FinishResponse();
+    return;
+  }
+  Ref<System::Stream> stream;
+  {
+    const std::lock_guard<std::mutex> lock(m_mutex);
+    stream = m_stream;
+  }
+  if (stream) {
+    Read(stream);
+  }
+}
+
+/// The system tells of a reset once: when a write was told, the read finds an orderly end. So the end counts as one, where
+/// a body ends by it, only when the write went well.
+void HttpExchange::OnEnd() {
+  {
+    const std::lock_guard<std::mutex> lock(m_mutex);
+    if (!m_isWriteOver && m_reader.EndsWithConnection()) {
+      m_endWaitsForWrite = true;
+      return;
+    }
+  }
+  FinishEnd();
+}
+
+void HttpExchange::FinishEnd() {
+  std::shared_ptr<const Exception> writeFailure;
+  {
+    const std::lock_guard<std::mutex> lock(m_mutex);
+    writeFailure = m_writeFailure;
+  }
+  if (writeFailure) {
+    Fail(*writeFailure);
+    return;
+  }
+  Judge([this] { m_reader.PutEnd(); });
+  FinishResponse();
+}
+
+void HttpExchange::FinishResponse() {
   ResponseData response = m_reader.Take();
   KeepCookies(response);
   Finish(nullptr, MakeRef<ClientResponseImpl>(std::move(response)));
@@ -149,6 +190,14 @@ void HttpExchange::KeepCookies(const ResponseData &response) {
     if (EqualsIgnoringCase(name, "Set-Cookie")) {
       m_cookies->SetFromHeader(value, m_spec->GetHost(), m_request.target, m_isSecure);
     }
+  }
+}
+
+void HttpExchange::Judge(const std::function<void()> &call) const {
+  try {
+    call();
+  } catch (const HttpException &exception) {
+    throw HttpException("Bad response from " + m_endpoint + ": " + exception.what());
   }
 }
 

@@ -45,13 +45,18 @@ private:
   ~HttpExchange() override;
 
   void OnConnected(const Ref<System::Stream> &stream, const Exception *failure);
-  void OnWritten();
+  void OnWritten(const Exception *failure);
   void OnRead(std::size_t count, const Exception *failure);
+  void OnEnd();
 
   void Send(const Ref<System::Stream> &stream);
   void Read(const Ref<System::Stream> &stream);
+  void FinishEnd();
+  void FinishResponse();
   void KeepCookies(const ResponseData &response);
 
+  /// Runs one call of the reader, and says in its exception whose response it is about.
+  void Judge(const std::function<void()> &call) const;
   /// Runs one step of the road; what it throws is how the exchange ends.
   void Step(const std::function<void()> &step);
   void Fail(const Exception &failure) { Finish(&failure, nullptr); }
@@ -76,6 +81,9 @@ private:
   Ref<System::Stream> m_stream;
   UserAgent::CompletionFunction m_completion;
   bool m_isCancelled = false;
+  bool m_isWriteOver = false;
+  bool m_endWaitsForWrite = false;
+  std::shared_ptr<const Exception> m_writeFailure;
   bool m_isFinishing = false; // the outcome stands, the completion function may be running
   bool m_isDone = false;
   std::shared_ptr<const Exception> m_failure;

@@ -46,6 +46,9 @@ public:
 
   bool IsComplete() const noexcept { return m_stage == Stage::COMPLETE; }
 
+  /// Whether the connection's end is now what completes the response.
+  bool EndsWithConnection() const noexcept { return m_stage == Stage::BODY_TO_END; }
+
   /// What was read; once, when complete.
   ResponseData Take();
 

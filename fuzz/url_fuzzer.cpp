@@ -1,0 +1,72 @@
+// SPDX-License-Identifier: Apache-2.0
+/// @file
+/// URLs: what is accepted can be written again from its parts and gives the same parts; no part can end the line that it
+/// is sent in.
+
+#include <tarvel/http/url.h>
+
+#include <algorithm>
+#include <cstddef>
+#include <cstdint>
+#include <cstdlib>
+#include <string>
+#include <string_view>
+
+namespace {
+
+using Tarvel::Http::MalformedURLException;
+using Tarvel::Http::ParseHttpURL;
+
+void Require(bool condition) {
+  if (!condition) {
+    std::abort();
+  }
+}
+
+struct Parts {
+  bool isSecure = false;
+  std::string host;
+  int port = 0;
+  std::string path;
+};
+
+bool Parse(std::string_view url, Parts &parts) {
+  try {
+    ParseHttpURL(url, parts.isSecure, parts.host, parts.port, parts.path);
+    return true;
+  } catch (const MalformedURLException &refusal) {
+    Require(*refusal.what() != '\0');
+    return false;
+  }
+}
+
+void RequireSafe(const Parts &parts) {
+  const auto isVisible = [](char c) { return c > ' ' && c < 0x7F; };
+  Require(!parts.host.empty() && std::all_of(parts.host.begin(), parts.host.end(), isVisible));
+  Require(parts.host.find_first_of("/?#@[]%") == std::string::npos);
+  Require(parts.port >= 1 && parts.port <= 65535);
+  Require(!parts.path.empty() && parts.path.front() == '/');
+  Require(std::all_of(parts.path.begin(), parts.path.end(), isVisible));
+  Require(parts.path.find('#') == std::string::npos);
+}
+
+std::string Write(const Parts &parts) {
+  const bool isV6 = parts.host.find(':') != std::string::npos;
+  const std::string host = isV6 ? "[" + parts.host + "]" : parts.host;
+  return (parts.isSecure ? "https://" : "http://") + host + ":" + std::to_string(parts.port) + parts.path;
+}
+
+} // namespace
+
+extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t *data, std::size_t size) {
+  Parts parts;
+  if (!Parse({reinterpret_cast<const char *>(data), size}, parts)) {
+    return 0;
+  }
+  RequireSafe(parts);
+  Parts again;
+  Require(Parse(Write(parts), again));
+  Require(again.isSecure == parts.isSecure && again.host == parts.host);
+  Require(again.port == parts.port && again.path == parts.path);
+  return 0;
+}
