@@ -83,6 +83,9 @@ int Run(int argc, char **argv) {
   } catch (const CLI::Success &success) { // --help and --version
     return app.exit(success);
   } catch (const CLI::ParseError &error) {
+    if (app.get_subcommands().empty() && !app.remaining().empty()) {
+      throw UsageException("unknown command or option '" + app.remaining().front() + "'; see ssoclient --help");
+    }
     throw UsageException(std::string(error.what()) + "; see ssoclient --help");
   }
   chosen();

@@ -429,6 +429,13 @@ TEST(Tool, WantsACommand) {
   ExpectResult(RunTool({}), 2, "", "ssoclient: usage: A subcommand is required; see ssoclient --help\n");
 }
 
+TEST(Tool, NamesAnUnknownCommandOrOption) {
+  ExpectResult(RunTool({"bogus", "token.xml"}), 2, "",
+               "ssoclient: usage: unknown command or option 'bogus'; see ssoclient --help\n");
+  ExpectResult(RunTool({"--bogus"}), 2, "",
+               "ssoclient: usage: unknown command or option '--bogus'; see ssoclient --help\n");
+}
+
 TEST(Tool, RefusesAnUnknownFormat) {
   ExpectResult(RunTool({"inspect", "--format", "yaml", "bearer.xml"}), 2, "",
                "ssoclient: usage: --format: yaml not in {text,json,xml}; see ssoclient --help\n");
