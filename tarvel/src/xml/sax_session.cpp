@@ -25,6 +25,10 @@ constexpr std::size_t LONGEST_FOREIGN_DETAIL = 300;
 // declaration is refused.
 constexpr int PARSE_OPTIONS = XML_PARSE_NONET | XML_PARSE_HUGE | XML_PARSE_IGNORE_ENC | XML_PARSE_NOENT;
 
+// An unbound prefix is no error here, but costs libxml2 a message that holds the name of the element again for each attribute.
+// A document of the greatest length that has short names stays below this; one of long names would take minutes.
+constexpr std::size_t MAX_UNBOUND_PREFIX_BYTES = 16 * MAX_DOCUMENT_BYTES;
+
 std::string_view ToView(const xmlChar *text) noexcept {
   return text ? std::string_view(reinterpret_cast<const char *>(text)) : std::string_view();
 }
@@ -129,9 +133,19 @@ struct SaxSession::Callbacks {
     Call(data, [=](SaxSession &session) { session.m_handler.ProcessingInstruction(ToView(target), ToView(content)); });
   }
 
-  static void Error(void *data, xmlErrorPtr error) {
-    if (!static_cast<SaxSession *>(data)->m_failure) { // the first error tells most
-      Call(data, [=](SaxSession &session) { session.TakeError(*error); });
+  static void Error(void *data, xmlErrorPtr error) noexcept {
+    SaxSession &session = *static_cast<SaxSession *>(data);
+    if (session.m_failure) { // the first error tells most
+      return;
+    }
+    try {
+      session.TakeError(*error);
+    } catch (...) {
+      session.m_failure = std::current_exception();
+    }
+    // After an error that is not fatal libxml2 goes on with pointers into the input; the next event stops it.
+    if (session.m_failure && error->level == XML_ERR_FATAL) {
+      session.Stop();
     }
   }
 
@@ -197,17 +211,17 @@ void SaxSession::Run() {
 void SaxSession::StartElement(const xmlChar *const *namespaces, std::size_t namespaceCount,
                               const xmlChar *const *attributes, std::size_t attributeCount) {
   const std::size_t end = GetOffset(); // behind the last attribute
-  const void *const lessThan = memrchr(m_source.data(), '<', end);
-  const std::size_t begin = static_cast<std::size_t>(static_cast<const char *>(lessThan) - m_source.data());
+  // The tag before this one begins at m_lineCounted: what lies between is searched once.
+  const char *const text = m_source.data();
+  const void *const lessThan = memrchr(text + m_lineCounted, '<', end - m_lineCounted);
+  const std::size_t begin = static_cast<std::size_t>(static_cast<const char *>(lessThan) - text);
   if (m_declarations.size() == MAX_ELEMENT_DEPTH) {
     Refuse("elements are nested deeper than " + std::to_string(MAX_ELEMENT_DEPTH), begin);
-    return;
   }
   m_declarations.push_back(namespaceCount);
   m_declarationsInScope += namespaceCount;
   if (m_declarationsInScope > MAX_NAMESPACES_IN_SCOPE) {
     Refuse("more than " + std::to_string(MAX_NAMESPACES_IN_SCOPE) + " namespace declarations are in scope", begin);
-    return;
   }
   ReadStartTag(begin, end, namespaces, namespaceCount, attributes, attributeCount);
   const SourcePosition position = AdvanceTo(begin);
@@ -265,18 +279,20 @@ void SaxSession::ReadStartTag(std::size_t begin, std::size_t end, const xmlChar 
 }
 
 void SaxSession::TakeError(const xmlError &error) {
-  if (error.level < XML_ERR_ERROR || error.code == XML_NS_ERR_UNDEFINED_NAMESPACE) {
+  if (error.level < XML_ERR_ERROR) {
+    return;
+  }
+  if (error.code == XML_NS_ERR_UNDEFINED_NAMESPACE) {
+    m_unboundPrefixBytes += error.message ? std::strlen(error.message) : 0;
+    if (m_unboundPrefixBytes > MAX_UNBOUND_PREFIX_BYTES) {
+      Refuse("names with unbound prefixes are too many and too long", GetOffset());
+    }
     return;
   }
   if (error.code == XML_ERR_NO_MEMORY) {
     throw std::bad_alloc();
   }
-  const SourcePosition position = GetPosition(m_source, GetOffset());
-  m_failure = std::make_exception_ptr(XMLParseException(GetDetail(error), position.line, position.column));
-  // After an error that is not fatal libxml2 goes on with pointers into the input; the next event stops it.
-  if (error.level == XML_ERR_FATAL) {
-    Stop();
-  }
+  Refuse(GetDetail(error), GetOffset());
 }
 
 std::size_t SaxSession::GetOffset() const noexcept {
@@ -298,7 +314,7 @@ SourcePosition SaxSession::AdvanceTo(std::size_t offset) noexcept {
   return {m_line, static_cast<std::uint32_t>(1 + offset - m_lineBegin)};
 }
 
-void SaxSession::Refuse(const std::string &detail, std::size_t offset) {
+void SaxSession::Refuse(const std::string &detail, std::size_t offset) const {
   const SourcePosition position = GetPosition(m_source, offset);
   throw XMLParseException(detail, position.line, position.column);
 }

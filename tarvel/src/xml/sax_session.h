@@ -47,7 +47,7 @@ private:
   /// Line and column of `offset`, which is never less than in the call before.
   SourcePosition AdvanceTo(std::size_t offset) noexcept;
 
-  void Refuse(const std::string &detail, std::size_t offset);
+  [[noreturn]] void Refuse(const std::string &detail, std::size_t offset) const;
   void Stop() noexcept;
 
   std::string_view m_source;
@@ -59,6 +59,7 @@ private:
   std::vector<AttributeEvent> m_attributes;
   std::vector<std::size_t> m_declarations; // of each open element
   std::size_t m_declarationsInScope = 0;
+  std::size_t m_unboundPrefixBytes = 0; // length of libxml2's messages about them
   std::size_t m_lineBegin;
   std::size_t m_lineCounted; // line breaks before this offset are counted
   std::uint32_t m_line = 1;

@@ -136,6 +136,26 @@ TEST(ParserLimits, AcceptsTextAndValuesOverTenMebibytes) {
   EXPECT_TRUE(withValue->GetDocumentElement()->GetFirstAttribute()->GetValue() == Repeat("\xC3\xA4 &", 1'300'000));
 }
 
+TEST(ParserLimits, RefusesUnboundPrefixesInNumberOnElementsWithLongNames) {
+  std::string tag = "<" + std::string(40'000, 'n');
+  for (int i = 0; i < 256; ++i) {
+    tag += " p:a" + std::to_string(i) + "=''";
+  }
+  const std::string text = "<r>\n" + Repeat(tag + "/>", MAX_DOCUMENT_BYTES / (tag.size() + 3));
+  try {
+    ParseDocument(text);
+    FAIL() << "accepted";
+  } catch (const XMLParseException &exception) {
+    EXPECT_EQ(exception.GetLine(), 2u);
+    EXPECT_EQ(std::string(exception.what()).find("names with unbound prefixes are too many and too long at "), 0u)
+        << exception.what();
+  }
+}
+
+TEST(ParserLimits, AcceptsUnboundPrefixesInNumberWhenNamesAreShort) {
+  EXPECT_NO_THROW(ParseDocument("<r>" + Repeat("<p:a q:x='1'/>", 1'000'000) + "</r>"));
+}
+
 TEST(ParserLimits, ReadsLargeDocumentsOfSmallPartsInLinearTime) {
   // Each of these takes well under a second when time is linear, and minutes when it is quadratic.
   EXPECT_NO_THROW(ParseDocument("<r>" + Repeat("<a/>", 2'000'000) + "</r>"));

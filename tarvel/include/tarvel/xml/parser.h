@@ -19,8 +19,8 @@ namespace Tarvel {
 namespace Xml {
 
 /// A document that is not well-formed (XML 1.0, Namespaces in XML 1.0), or that has what this platform refuses: a document
-/// type declaration, an encoding other than UTF-8, or more than one of the limits below. The message ends in
-/// " at line L, column C".
+/// type declaration, an encoding other than UTF-8, more than one of the limits below, or long names with unbound
+/// prefixes in such number that looking at them all would take too long. The message ends in " at line L, column C".
 class TARVEL_API XMLParseException : public Exception {
 public:
   XMLParseException(const std::string &detail, std::uint32_t line, std::uint32_t column);
