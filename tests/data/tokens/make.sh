@@ -148,11 +148,15 @@ token style-pretty pretty sts-rsa pretty=true
 
 # Algorithms.
 for bits in 256 384 512; do
-  digest=SHA$bits
-  token rsa-sha$bits bearer sts-rsa "method=${MORE}rsa-sha$bits" "digest=${!digest}"
+  case $bits in
+    256) digest=$SHA256 ;;
+    384) digest=${MORE}sha384 ;;
+    512) digest=http://www.w3.org/2001/04/xmlenc#sha512 ;;
+  esac
+  token rsa-sha$bits bearer sts-rsa "method=${MORE}rsa-sha$bits" "digest=$digest"
   pss_token rsa-pss-sha$bits bearer sts-rsa $bits
   for curve in 256 384 521; do
-    token ecdsa-p$curve-sha$bits bearer sts-ec$curve "method=${MORE}ecdsa-sha$bits" "digest=${!digest}"
+    token ecdsa-p$curve-sha$bits bearer sts-ec$curve "method=${MORE}ecdsa-sha$bits" "digest=$digest"
   done
 done
 token rsa3072 bearer sts-rsa3072
