@@ -1,0 +1,69 @@
+// SPDX-License-Identifier: Apache-2.0
+/// @file
+/// Responses: each operation ends, on any bytes, in a result or in a documented exception that leaves the caller's record
+/// alone.
+
+#include "exchange/response_handler_impl.h"
+
+#include <ssoclient/exceptions.h>
+#include <tarvel/core/ref.h>
+#include <tarvel/io/reader.h>
+#include <tarvel/xml/security/exceptions.h>
+
+#include <cstddef>
+#include <cstdint>
+#include <cstdlib>
+#include <string>
+
+namespace {
+
+using SsoClient::ResponseHandlerImpl;
+
+void Require(bool condition) {
+  if (!condition) {
+    std::abort();
+  }
+}
+
+/// Whether `operation` returned; every other end but the documented ones ends the program.
+template <typename Operation>
+bool Succeeds(const Operation &operation, const std::string &response) {
+  try {
+    operation(Tarvel::CreateStringReader(response).get());
+    return true;
+  } catch (const SsoClient::SsoException &) {
+  } catch (const Tarvel::Xml::Security::XmlSecurityException &) {
+  }
+  return false;
+}
+
+using TokenHandler = void (ResponseHandlerImpl::*)(Tarvel::Reader *, std::string &) const;
+
+void CheckToken(TokenHandler handle, const std::string &response) {
+  std::string token = "before";
+  const bool hasToken =
+      Succeeds([&](Tarvel::Reader *reader) { (ResponseHandlerImpl().*handle)(reader, token); }, response);
+  Require(hasToken ? token.front() == '<' && token.back() == '>' : token == "before");
+}
+
+void CheckLeg(const std::string &response) {
+  SsoClient::SPNegoResponse leg{"before", {1, 2, 3}, "before"};
+  const bool hasLeg =
+      Succeeds([&](Tarvel::Reader *reader) { ResponseHandlerImpl().HandleSPNegoResponse(reader, leg); }, response);
+  if (!hasLeg) {
+    Require(leg.contextId == "before" && leg.leg.size() == 3 && leg.tokenXml == "before");
+    return;
+  }
+  Require(leg.tokenXml.empty() || leg.tokenXml.front() == '<');
+}
+
+} // namespace
+
+extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t *data, std::size_t size) {
+  const std::string response(reinterpret_cast<const char *>(data), size);
+  CheckToken(&ResponseHandlerImpl::HandleAcquireTokenResponse, response);
+  CheckToken(&ResponseHandlerImpl::HandleRenewTokenResponse, response);
+  Succeeds([](Tarvel::Reader *reader) { ResponseHandlerImpl().HandleValidateSubjectResponse(reader); }, response);
+  CheckLeg(response);
+  return 0;
+}

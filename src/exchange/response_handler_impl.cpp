@@ -1,0 +1,51 @@
+// SPDX-License-Identifier: Apache-2.0
+#include "exchange/response_handler_impl.h"
+
+#include "exchange/response_extractors.h"
+#include "exchange/soap_response.h"
+
+#include <ssoclient/exceptions.h>
+#include <tarvel/core/ref.h>
+#include <tarvel/xml/node.h>
+
+namespace SsoClient {
+
+namespace {
+
+using Tarvel::Xml::ElementNode;
+
+/// What `extractor` makes of the body of a response that is no fault. The root element's own name does not count.
+template <typename Extractor>
+auto ProcessResponseWith(Tarvel::Reader &response, const Extractor &extractor) {
+  const Tarvel::Ref<const ElementNode> envelope = ParseResponseDocument(response);
+  CheckSoapFault(*envelope);
+  const ElementNode *const body = envelope->FindChildElement("Body");
+  if (!body) {
+    // "SAOP" is how the message is known.
+    throw SsoException("Unexpected response format: missing SAOP Body.");
+  }
+  return extractor(*body);
+}
+
+} // namespace
+
+void ResponseHandlerImpl::HandleAcquireTokenResponse(Tarvel::Reader *response, std::string &tokenXml) const {
+  tokenXml = ProcessResponseWith(*response, ExtractIssuedToken);
+}
+
+bool ResponseHandlerImpl::HandleValidateSubjectResponse(Tarvel::Reader *response) const {
+  return ProcessResponseWith(*response, ExtractValidationStatus);
+}
+
+void ResponseHandlerImpl::HandleRenewTokenResponse(Tarvel::Reader *response, std::string &tokenXml) const {
+  tokenXml = ProcessResponseWith(*response, ExtractRenewedToken);
+}
+
+void ResponseHandlerImpl::HandleSPNegoResponse(Tarvel::Reader *response, SPNegoResponse &spnego) const {
+  SPNegoResponse leg = ProcessResponseWith(*response, ExtractSPNegoLeg);
+  spnego.contextId.swap(leg.contextId);
+  spnego.leg.swap(leg.leg);
+  spnego.tokenXml.swap(leg.tokenXml);
+}
+
+} // namespace SsoClient

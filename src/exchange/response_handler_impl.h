@@ -1,0 +1,25 @@
+// SPDX-License-Identifier: Apache-2.0
+/// @file
+/// `ResponseHandlerImpl`, which reads the response of each operation.
+
+#pragma once
+
+#include "exchange/response_handler.h"
+
+namespace SsoClient {
+
+/// Parses the body, turns a SOAP fault into an exception, and takes out what the operation asked for. Without state, so
+/// one handler serves any number of threads. A call that throws leaves its out argument alone.
+///
+/// All throw `InvalidCredentialsException` when the service refused the caller's credentials; `SsoException` for every
+/// other fault, for what is not well-formed XML, and for a response of another form; `ParseException` for a fault code
+/// whose prefix is not bound; `Tarvel::Xml::Security::XmlSecurityException` for an assertion that has no canonical form.
+class ResponseHandlerImpl final : public ResponseHandler {
+public:
+  void HandleAcquireTokenResponse(Tarvel::Reader *response, std::string &tokenXml) const override;
+  bool HandleValidateSubjectResponse(Tarvel::Reader *response) const override;
+  void HandleRenewTokenResponse(Tarvel::Reader *response, std::string &tokenXml) const override;
+  void HandleSPNegoResponse(Tarvel::Reader *response, SPNegoResponse &spnego) const override;
+};
+
+} // namespace SsoClient

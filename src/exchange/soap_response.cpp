@@ -1,0 +1,87 @@
+// SPDX-License-Identifier: Apache-2.0
+#include "exchange/soap_response.h"
+
+#include "model/namespaces.h"
+#include "xml/node_text.h"
+#include "xml/parse_xml.h"
+#include "xml/qualified_name.h"
+
+#include <ssoclient/exceptions.h>
+#include <tarvel/xml/document.h>
+#include <tarvel/xml/parser.h>
+#include <tarvel/xml/qname.h>
+
+#include <algorithm>
+#include <string>
+
+namespace SsoClient {
+
+namespace {
+
+using Tarvel::Ref;
+using Tarvel::Xml::Document;
+using Tarvel::Xml::ElementNode;
+using Tarvel::Xml::QName;
+using Tarvel::Xml::TextNode;
+
+struct FaultName {
+  std::string_view namespaceUri;
+  std::string_view localName;
+};
+
+/// What services answer when it is the caller's credentials that they refuse.
+constexpr FaultName AUTHENTICATION_FAULTS[] = {
+    {Namespaces::WST, "FailedAuthentication"},
+    {Namespaces::WST, "InvalidSecurityToken"},
+    {Namespaces::WSSE, "InvalidSecurityToken"},
+};
+
+bool MeansFailedAuthentication(const QName &faultCode) {
+  return std::any_of(std::begin(AUTHENTICATION_FAULTS), std::end(AUTHENTICATION_FAULTS), [&](const FaultName &name) {
+    return faultCode.namespaceUri == name.namespaceUri && faultCode.localName == name.localName;
+  });
+}
+
+} // namespace
+
+Ref<const ElementNode> ParseResponseDocument(Tarvel::Reader &response) {
+  Ref<const Document> document;
+  try {
+    Ref<Document> parsed;
+    ParseXML(response, parsed);
+    document = parsed;
+  } catch (const Tarvel::Xml::XMLParseException &error) {
+    throw SsoException(std::string("Response is not well-formed XML: ") + error.what());
+  }
+  return Ref<const ElementNode>(document->GetDocumentElement());
+}
+
+void CheckSoapFault(const ElementNode &envelope) {
+  const ElementNode *const fault = FindDescendant(&envelope, {"Body", "Fault"});
+  if (!fault) {
+    return;
+  }
+  const ElementNode *const faultCode = fault->FindChildElement("faultcode");
+  const TextNode *const codeText = GetTextNode(faultCode);
+  if (!codeText) {
+    throw SsoException("Invalid SOAP response: missing faultcode.");
+  }
+  QName name;
+  ResolveQName(*faultCode, codeText->GetValue(), Namespaces::SOAPENV, name);
+  const std::string faultString = GetText(GetTextNode(fault->FindChildElement("faultstring")));
+  if (MeansFailedAuthentication(name)) {
+    throw InvalidCredentialsException("Authentication failed" + (faultString.empty() ? "" : ": " + faultString));
+  }
+  throw SsoException("Unexpected SOAP fault: " + GetText(codeText) + "; request failed.");
+}
+
+const ElementNode *FindDescendant(const ElementNode *start,
+                                  std::initializer_list<std::string_view> localNames) noexcept {
+  const ElementNode *element = start;
+  for (const std::string_view localName : localNames) {
+    element = element ? element->FindChildElement(localName) : nullptr;
+  }
+  return element;
+}
+
+} // namespace SsoClient

@@ -1,0 +1,353 @@
+// SPDX-License-Identifier: Apache-2.0
+#include "exchange/response_handler_impl.h"
+
+#include "support/soap_responses.h"
+#include "support/throws_message.h"
+
+#include <ssoclient/exceptions.h>
+#include <tarvel/core/ref.h>
+#include <tarvel/io/reader.h>
+#include <tarvel/xml/security/exceptions.h>
+
+#include <gtest/gtest.h>
+
+#include <cstdint>
+#include <functional>
+#include <ostream>
+#include <string>
+#include <vector>
+
+namespace SsoClient {
+namespace {
+
+using Testing::Collection;
+using Testing::Envelope;
+using Testing::FaultResponse;
+using Testing::Requested;
+using Testing::ResponseElement;
+
+const char ASSERTION[] = "<saml:Assertion xmlns:saml='urn:oasis:names:tc:SAML:2.0:assertion' ID='_1'><!-- gone -->"
+                         "<saml:Issuer a='1'/></saml:Assertion>";
+/// Its inclusive canonical form within an envelope of `Testing::Envelope`.
+const char CANONICAL_ASSERTION[] =
+    R"(<saml:Assertion xmlns:saml="urn:oasis:names:tc:SAML:2.0:assertion")"
+    R"( xmlns:soapenv="http://schemas.xmlsoap.org/soap/envelope/")"
+    R"( xmlns:wsse="http://docs.oasis-open.org/wss/2004/01/oasis-200401-wss-wssecurity-secext-1.0.xsd")"
+    R"( xmlns:wst="http://docs.oasis-open.org/ws-sx/ws-trust/200512" ID="_1"><saml:Issuer a="1"></saml:Issuer>)"
+    R"(</saml:Assertion>)";
+const char VALID[] = "http://docs.oasis-open.org/ws-sx/ws-trust/200512/status/valid";
+const char INVALID[] = "http://docs.oasis-open.org/ws-sx/ws-trust/200512/status/invalid";
+const char UNEXPECTED[] = "Unexpected XML format";
+
+std::string Acquire(const std::string &response) {
+  std::string token = "before";
+  ResponseHandlerImpl().HandleAcquireTokenResponse(Tarvel::CreateStringReader(response).get(), token);
+  return token;
+}
+
+std::string Renew(const std::string &response) {
+  std::string token = "before";
+  ResponseHandlerImpl().HandleRenewTokenResponse(Tarvel::CreateStringReader(response).get(), token);
+  return token;
+}
+
+std::string Validate(const std::string &response) {
+  return ResponseHandlerImpl().HandleValidateSubjectResponse(Tarvel::CreateStringReader(response).get()) ? "valid"
+                                                                                                         : "invalid";
+}
+
+SPNegoResponse ReadLeg(const std::string &response) {
+  SPNegoResponse leg{"before", {1}, "before"};
+  ResponseHandlerImpl().HandleSPNegoResponse(Tarvel::CreateStringReader(response).get(), leg);
+  return leg;
+}
+
+std::string Negotiate(const std::string &response) {
+  return ReadLeg(response).contextId;
+}
+
+struct Operation {
+  const char *name;
+  std::string (*handle)(const std::string &);
+};
+
+void PrintTo(const Operation &operation, std::ostream *out) {
+  *out << operation.name;
+}
+
+/// What holds whatever the operation is.
+class EachResponse : public testing::TestWithParam<Operation> {
+protected:
+  std::string Handle(const std::string &response) const { return GetParam().handle(response); }
+};
+
+TEST_P(EachResponse, IsRefusedWithTheParsersMessageWhenItIsNotXml) {
+  EXPECT_THROWS_MESSAGE(Handle("<a><b></a>"), SsoException,
+                        "Response is not well-formed XML: Opening and ending tag mismatch: b line 1 and a at line 1, "
+                        "column 11");
+  EXPECT_THROW(Handle(""), SsoException);
+  EXPECT_THROW(Handle("<!DOCTYPE a><a/>"), SsoException);
+}
+
+TEST_P(EachResponse, IsRefusedWithoutBodyWhateverElseItHolds) {
+  const char message[] = "Unexpected response format: missing SAOP Body.";
+  EXPECT_THROWS_MESSAGE(Handle("<Envelope/>"), SsoException, message);
+  EXPECT_THROWS_MESSAGE(Handle("<Envelope><Fault><faultcode>a</faultcode></Fault></Envelope>"), SsoException, message);
+  EXPECT_THROWS_MESSAGE(Handle("<Body><Fault><faultcode>a</faultcode></Fault></Body>"), SsoException, message);
+  EXPECT_THROWS_MESSAGE(Handle(ResponseElement("x", " xmlns:wst='w'")), SsoException, message);
+}
+
+TEST_P(EachResponse, IsRefusedWithAnEmptyBody) {
+  EXPECT_THROWS_MESSAGE(Handle(Envelope("")), SsoException, UNEXPECTED);
+  EXPECT_THROWS_MESSAGE(Handle(Envelope("text <!-- and a comment -->")), SsoException, UNEXPECTED);
+}
+
+TEST_P(EachResponse, SeesAFaultOnlyAsAChildOfTheBody) {
+  EXPECT_THROWS_MESSAGE(Handle(Envelope("<x><Fault><faultcode>a</faultcode></Fault></x>")), SsoException, UNEXPECTED);
+}
+
+TEST_P(EachResponse, ReportsAFaultThoughThereIsAResultToo) {
+  const std::string fault = "<Fault><faultcode>busy</faultcode></Fault>";
+  EXPECT_THROWS_MESSAGE(Handle(Envelope(Collection(ResponseElement(Requested(ASSERTION))) + fault)), SsoException,
+                        "Unexpected SOAP fault: busy; request failed.");
+}
+
+INSTANTIATE_TEST_SUITE_P(ResponseHandlerImpl, EachResponse,
+                         testing::Values(Operation{"Acquire", Acquire}, Operation{"Renew", Renew},
+                                         Operation{"Validate", Validate}, Operation{"Negotiate", Negotiate}),
+                         [](const auto &operation) { return std::string(operation.param.name); });
+
+TEST(CheckSoapFault, TellsFailedAuthenticationByEachOfItsThreeNames) {
+  for (const char *code : {"wst:FailedAuthentication", "wst:InvalidSecurityToken", "wsse:InvalidSecurityToken"}) {
+    EXPECT_THROWS_MESSAGE(Acquire(FaultResponse(code, "Wrong password")), InvalidCredentialsException,
+                          "Authentication failed: Wrong password");
+  }
+}
+
+TEST(CheckSoapFault, TellsThePrefixByTheDeclarationsAtTheFaultCodeAlone) {
+  EXPECT_THROWS_MESSAGE(
+      Acquire("<Envelope><Body><Fault><faultcode xmlns:f='http://docs.oasis-open.org/ws-sx/ws-trust/200512'>"
+              "f:FailedAuthentication</faultcode></Fault></Body></Envelope>"),
+      InvalidCredentialsException, "Authentication failed");
+}
+
+TEST(CheckSoapFault, AddsNothingForAFaultStringThatIsEmptyMissingOrNoText) {
+  const std::string code = "<faultcode>wst:FailedAuthentication</faultcode>";
+  for (const char *text : {"", "<faultstring/>", "<faultstring></faultstring>", "<faultstring><b>x</b></faultstring>",
+                           "<faultstring><!-- x -->y</faultstring>"}) {
+    EXPECT_THROWS_MESSAGE(Acquire(Envelope("<Fault>" + code + text + "</Fault>")), InvalidCredentialsException,
+                          "Authentication failed");
+  }
+}
+
+TEST(CheckSoapFault, ReportsAnyOtherCodeAsItIsWrittenWithoutTheFaultString) {
+  struct {
+    const char *code;
+    const char *message;
+  } const cases[] = {
+      {"wsse:FailedAuthentication", "Unexpected SOAP fault: wsse:FailedAuthentication; request failed."},
+      {"soapenv:FailedAuthentication", "Unexpected SOAP fault: soapenv:FailedAuthentication; request failed."},
+      {"wst:failedauthentication", "Unexpected SOAP fault: wst:failedauthentication; request failed."},
+      {"wst:FailedAuthentication ", "Unexpected SOAP fault: wst:FailedAuthentication ; request failed."},
+      {"wst:RequestFailed", "Unexpected SOAP fault: wst:RequestFailed; request failed."},
+      {"FailedAuthentication", "Unexpected SOAP fault: FailedAuthentication; request failed."},
+      {"soapenv:Server", "Unexpected SOAP fault: soapenv:Server; request failed."},
+      {"Server", "Unexpected SOAP fault: Server; request failed."},
+  };
+  for (const auto &expected : cases) {
+    EXPECT_THROWS_MESSAGE(Acquire(FaultResponse(expected.code, "secret detail")), SsoException, expected.message);
+  }
+}
+
+TEST(CheckSoapFault, RefusesAFaultWithoutFaultCodeText) {
+  for (const char *code : {"", "<faultcode/>", "<faultcode><b>wst:FailedAuthentication</b></faultcode>",
+                           "<faultcode><!-- x -->wst:FailedAuthentication</faultcode>"}) {
+    EXPECT_THROWS_MESSAGE(Acquire(Envelope("<Fault>" + std::string(code) + "<faultstring>x</faultstring></Fault>")),
+                          SsoException, "Invalid SOAP response: missing faultcode.");
+  }
+}
+
+TEST(CheckSoapFault, RefusesAFaultCodeWhosePrefixIsNotBound) {
+  EXPECT_THROWS_MESSAGE(Acquire("<Envelope><Body><Fault>\n<faultcode>p:Server</faultcode></Fault></Body></Envelope>"),
+                        ParseException, "Element faultcodeat 2,1 uses undefined prefix: `p'");
+}
+
+TEST(HandleAcquireTokenResponse, YieldsTheCanonicalFormOfTheAssertionAsItStoodInTheResponse) {
+  EXPECT_EQ(Acquire(Testing::IssueResponse(ASSERTION)), CANONICAL_ASSERTION);
+}
+
+TEST(HandleAcquireTokenResponse, ComparesLocalNamesAloneAndTakesTheFirstOfAName) {
+  EXPECT_EQ(Acquire("<a><Body><RequestSecurityTokenResponseCollection><RequestSecurityTokenResponse>"
+                    "<RequestedSecurityToken><x xmlns='urn:x'/><Assertion/><Assertion ID='2'/></RequestedSecurityToken>"
+                    "</RequestSecurityTokenResponse></RequestSecurityTokenResponseCollection></Body></a>"),
+            "<Assertion></Assertion>");
+}
+
+TEST(HandleAcquireTokenResponse, DoesNotGoBackForASecondElementOfAName) {
+  EXPECT_THROWS_MESSAGE(Acquire(Envelope(Collection(ResponseElement("") + ResponseElement(Requested(ASSERTION))))),
+                        SsoException, UNEXPECTED);
+}
+
+TEST(HandleAcquireTokenResponse, DoesNotLookAtTheTokenType) {
+  EXPECT_EQ(Acquire(Envelope(Collection(ResponseElement("<TokenType>urn:other</TokenType>" + Requested(ASSERTION))))),
+            CANONICAL_ASSERTION);
+}
+
+TEST(HandleAcquireTokenResponse, RefusesAResponseThatLacksAStep) {
+  for (const std::string &content :
+       {ResponseElement(Requested(ASSERTION)), Collection(""), Collection(ResponseElement("")),
+        Collection(ResponseElement("<RequestedSecurityToken/>")), Collection(Requested(ASSERTION)),
+        Collection(ResponseElement(ASSERTION)), std::string(ASSERTION)}) {
+    EXPECT_THROWS_MESSAGE(Acquire(Envelope(content)), SsoException, UNEXPECTED) << content;
+  }
+}
+
+TEST(HandleAcquireTokenResponse, LetsTheRefusalOfAnAssertionWithoutCanonicalFormPassAsItIs) {
+  EXPECT_THROW(Acquire(Testing::IssueResponse("<Assertion><p:a/></Assertion>")),
+               Tarvel::Xml::Security::XmlSecurityException);
+}
+
+TEST(HandleAcquireTokenResponse, LeavesTheTextAloneWhenItFails) {
+  std::string token = "before";
+  EXPECT_THROW(ResponseHandlerImpl().HandleAcquireTokenResponse(Tarvel::CreateStringReader(Envelope("")).get(), token),
+               SsoException);
+  EXPECT_EQ(token, "before");
+}
+
+TEST(HandleRenewTokenResponse, YieldsTheCanonicalFormOfTheAssertion) {
+  EXPECT_EQ(Renew(Testing::RenewResponse(ASSERTION)), CANONICAL_ASSERTION);
+}
+
+TEST(HandleRenewTokenResponse, RefusesACollectionAndAResponseThatLacksAStep) {
+  for (const std::string &content :
+       {Collection(ResponseElement(Requested(ASSERTION))), ResponseElement(""),
+        ResponseElement("<RequestedSecurityToken/>"), ResponseElement(ASSERTION), Requested(ASSERTION)}) {
+    EXPECT_THROWS_MESSAGE(Renew(Envelope(content)), SsoException, UNEXPECTED) << content;
+  }
+}
+
+TEST(HandleValidateSubjectResponse, ReadsBothVerdicts) {
+  EXPECT_EQ(Validate(Testing::ValidateResponse(VALID)), "valid");
+  EXPECT_EQ(Validate(Testing::ValidateResponse(INVALID)), "invalid");
+}
+
+TEST(HandleValidateSubjectResponse, ReadsTextThatStandsInCdataOrBeforeAComment) {
+  EXPECT_EQ(Validate(Testing::ValidateResponse("<![CDATA[" + std::string(VALID) + "]]>")), "valid");
+}
+
+TEST(HandleValidateSubjectResponse, RefusesAnyOtherText) {
+  const std::string valid = VALID;
+  for (const std::string &code : {" " + valid, valid + " ", "\n" + valid + "\n", valid + "/", std::string("valid"),
+                                  std::string(), "<b>" + valid + "</b>", "<!-- x -->" + valid,
+                                  std::string("http://docs.oasis-open.org/ws-sx/ws-trust/200512/status/Valid"),
+                                  std::string("http://docs.oasis-open.org/ws-sx/ws-trust/200512//status/valid"),
+                                  std::string("http://docs.oasis-open.org/ws-sx/ws-trust/200512")}) {
+    EXPECT_THROWS_MESSAGE(Validate(Testing::ValidateResponse(code)), SsoException, UNEXPECTED) << code;
+  }
+}
+
+TEST(HandleValidateSubjectResponse, RefusesAResponseThatLacksAStep) {
+  for (const std::string &content :
+       {ResponseElement(""), ResponseElement("<Status/>"), ResponseElement("<Code>" + std::string(VALID) + "</Code>"),
+        Collection(ResponseElement("<Status><Code>" + std::string(VALID) + "</Code></Status>"))}) {
+    EXPECT_THROWS_MESSAGE(Validate(Envelope(content)), SsoException, UNEXPECTED) << content;
+  }
+}
+
+TEST(HandleSPNegoResponse, ReadsAnIntermediateLegWithAnEmptyToken) {
+  const SPNegoResponse leg = ReadLeg(Testing::IntermediateLeg("urn:ctx", "aGVs\nbG8="));
+  EXPECT_EQ(leg.contextId, "urn:ctx");
+  EXPECT_EQ(leg.leg, (std::vector<std::uint8_t>{'h', 'e', 'l', 'l', 'o'}));
+  EXPECT_EQ(leg.tokenXml, "");
+}
+
+TEST(HandleSPNegoResponse, ReadsAFinalLegWithExchangeAndToken) {
+  const SPNegoResponse leg = ReadLeg(Testing::FinalLeg("urn:ctx", "AQID", ASSERTION));
+  EXPECT_EQ(leg.contextId, "urn:ctx");
+  EXPECT_EQ(leg.leg, (std::vector<std::uint8_t>{1, 2, 3}));
+  EXPECT_EQ(leg.tokenXml, CANONICAL_ASSERTION);
+}
+
+TEST(HandleSPNegoResponse, ReplacesEveryFieldAlsoWhenTheFinalLegBringsNoExchange) {
+  const SPNegoResponse leg = ReadLeg(Testing::FinalLeg("", "", ASSERTION));
+  EXPECT_EQ(leg.contextId, "");
+  EXPECT_EQ(leg.leg, std::vector<std::uint8_t>());
+  EXPECT_EQ(leg.tokenXml, CANONICAL_ASSERTION);
+}
+
+TEST(HandleSPNegoResponse, TakesAResponseOutsideTheCollectionAsIntermediateWhateverElseThereIs) {
+  const std::string final = Testing::FinalLeg("final", "AQID", ASSERTION);
+  const std::string intermediate = ResponseElement("<BinaryExchange>BAUG</BinaryExchange>", " Context='first'");
+  const std::string body = "<soapenv:Body>";
+  std::string both = final;
+  both.insert(both.find(body) + body.size(), intermediate);
+  EXPECT_EQ(ReadLeg(both).contextId, "first");
+  EXPECT_EQ(ReadLeg(both).tokenXml, "");
+}
+
+TEST(HandleSPNegoResponse, RefusesALegWithoutContext) {
+  const std::string exchange = "<BinaryExchange>AQID</BinaryExchange>";
+  const std::string type = "<TokenType>urn:oasis:names:tc:SAML:2.0:assertion</TokenType>";
+  for (const std::string &content :
+       {ResponseElement(exchange), Collection(ResponseElement(exchange + type + Requested(ASSERTION))),
+        ResponseElement(exchange, " xmlns:p='urn:p' p:Context='c'"), Collection(""), Collection(exchange)}) {
+    EXPECT_THROWS_MESSAGE(ReadLeg(Envelope(content)), SsoException, UNEXPECTED) << content;
+  }
+}
+
+TEST(HandleSPNegoResponse, RefusesAnIntermediateLegWithoutExchange) {
+  for (const char *exchange : {"", "<BinaryExchange/>", "<BinaryExchange><b>AQID</b></BinaryExchange>"}) {
+    EXPECT_THROWS_MESSAGE(ReadLeg(Envelope(ResponseElement(exchange, " Context='c'"))), SsoException, UNEXPECTED);
+  }
+}
+
+TEST(HandleSPNegoResponse, RefusesBrokenBase64InBothKindsOfLeg) {
+  for (const char *exchange : {"AQI", "AQ=D", "A*ID", "=", "AQIDBA=="}) {
+    const bool isBroken = std::string(exchange) != "AQIDBA==";
+    if (!isBroken) {
+      EXPECT_NO_THROW(ReadLeg(Testing::IntermediateLeg("c", exchange)));
+      continue;
+    }
+    EXPECT_THROWS_MESSAGE(ReadLeg(Testing::IntermediateLeg("c", exchange)), SsoException, "Base64 format exception");
+    EXPECT_THROWS_MESSAGE(ReadLeg(Testing::FinalLeg("c", exchange, ASSERTION)), SsoException,
+                          "Base64 format exception");
+  }
+}
+
+TEST(HandleSPNegoResponse, RefusesAFinalLegWithoutToken) {
+  const std::string type = "<TokenType>urn:oasis:names:tc:SAML:2.0:assertion</TokenType>";
+  for (const std::string &content : {type, type + "<RequestedSecurityToken/>", type + ASSERTION}) {
+    EXPECT_THROWS_MESSAGE(ReadLeg(Envelope(Collection(ResponseElement(content, " Context='c'")))), SsoException,
+                          UNEXPECTED);
+  }
+}
+
+TEST(HandleSPNegoResponse, RefusesAFinalLegOfAnotherTokenTypeWithAMessageWhoseParenthesisStaysOpen) {
+  const auto final = [](const std::string &type) {
+    return Envelope(Collection(ResponseElement(type + Requested(ASSERTION), " Context='c'")));
+  };
+  EXPECT_THROWS_MESSAGE(ReadLeg(final("")), SsoException,
+                        "Invalid token type:  (expected: urn:oasis:names:tc:SAML:2.0:assertion");
+  EXPECT_THROWS_MESSAGE(ReadLeg(final("<TokenType>urn:other</TokenType>")), SsoException,
+                        "Invalid token type: urn:other (expected: urn:oasis:names:tc:SAML:2.0:assertion");
+}
+
+TEST(HandleSPNegoResponse, LeavesTheRecordAloneWhenItFails) {
+  SPNegoResponse leg{"before", {1}, "before"};
+  const std::string response = Envelope(Collection(ResponseElement(Requested(ASSERTION), " Context='c'")));
+  EXPECT_THROW(ResponseHandlerImpl().HandleSPNegoResponse(Tarvel::CreateStringReader(response).get(), leg),
+               SsoException);
+  EXPECT_EQ(leg.contextId, "before");
+  EXPECT_EQ(leg.leg, std::vector<std::uint8_t>{1});
+  EXPECT_EQ(leg.tokenXml, "before");
+}
+
+TEST(ResponseHandlerImpl, RefusesEveryPrefixOfAResponse) {
+  const std::string response = Testing::FinalLeg("c", "AQID", ASSERTION);
+  for (std::size_t length = 0; length < response.size(); ++length) {
+    EXPECT_THROW(ReadLeg(response.substr(0, length)), SsoException) << "the first " << length << " bytes";
+  }
+}
+
+} // namespace
+} // namespace SsoClient
