@@ -3,7 +3,10 @@
 // each piece of memory as it is given back.
 #include "compose/ws_security.h"
 #include "exchange/request_builder_impl.h"
+#include "service/wiped_text.h"
 #include "support/identity.h"
+#include "support/rendezvous.h"
+#include "support/service_stand_ins.h"
 
 #include <tarvel/core/exception.h>
 #include <tarvel/core/secure_wipe.h>
@@ -15,6 +18,7 @@
 #include <atomic>
 #include <cstdlib>
 #include <cstring>
+#include <memory>
 #include <new>
 #include <string_view>
 
@@ -98,6 +102,21 @@ TokenSpec Spec() {
   return spec;
 }
 
+/// Answers each request without keeping a copy, which would hold the password.
+class ForgetfulTransport final : public Transport {
+public:
+  std::shared_ptr<TransportSession> CreateSession() const override { return std::make_shared<Session>(); }
+
+private:
+  class Session final : public TransportSession {
+  public:
+    void SendRequest(const Request &, Tarvel::Ref<Tarvel::Reader> &response) override {
+      response = Tarvel::CreateStringReader("issued:");
+    }
+    void SendRequestAsync(const Request &, const Completion &, Tarvel::Ref<Tarvel::System::ScheduledItem> &) override {}
+  };
+};
+
 class FreedMemory : public testing::TestWithParam<const char *> {};
 
 TEST_P(FreedMemory, IsFoundToHoldASecretThatNobodyWiped) {
@@ -134,6 +153,37 @@ TEST_P(FreedMemory, HoldsNoPasswordOfARequestThatCannotBeBuilt) {
                Tarvel::InvalidArgumentException);
   spec.delegateTo = std::string("\x01");
   EXPECT_THROW(builder.BuildUserPassTokenRequest("alice", password, spec, request), Tarvel::InvalidArgumentException);
+  EXPECT_EQ(watch.Found(), 0);
+}
+
+TEST_P(FreedMemory, HoldsNoTextThatWasKeptAsASecret) {
+  const std::string password = GetParam();
+  const Watch watch(GetParam());
+  auto text = std::make_unique<WipedText>(password);
+  auto copy = std::make_unique<WipedText>(*text);
+  text.reset();
+  EXPECT_EQ(copy->Get(), password);
+  copy.reset();
+  EXPECT_EQ(watch.Found(), 0);
+}
+
+TEST_P(FreedMemory, HoldsNoPasswordOfAnAsynchronousOperationThatIsOver) {
+  const std::string password = GetParam();
+  const TokenSpec spec = Spec();
+  const auto over = std::make_shared<Testing::EventCount>();
+  const Watch watch(GetParam());
+  auto transport = std::shared_ptr<ForgetfulTransport>(new ForgetfulTransport, [over](ForgetfulTransport *object) {
+    delete object;
+    over->Add();
+  });
+  auto service = std::make_shared<SecurityTokenServiceImpl>(
+      std::make_shared<const RequestBuilderImpl>(boost::none), transport,
+      std::make_shared<const Testing::ResponseHandlerStandIn>(), Tarvel::Crypto::CertificateList());
+  transport.reset();
+  service->AcquireTokenAsync("alice", password, spec,
+                             [](const std::shared_ptr<const SamlToken> &, const Tarvel::Exception *) {});
+  service.reset();
+  ASSERT_TRUE(over->WaitFor(1)); // the work releases the service after the password
   EXPECT_EQ(watch.Found(), 0);
 }
 

@@ -1,0 +1,28 @@
+// SPDX-License-Identifier: Apache-2.0
+#include "exchange/request_builder_impl.h"
+#include "exchange/response_handler_impl.h"
+#include "service/security_token_service_impl.h"
+#include "transport/https_client.h"
+
+#include <tarvel/ssl/ssl_context.h>
+
+namespace SsoClient {
+
+namespace {
+
+/// Four minutes. A service may have to ask others before it answers, so this is long, and not configurable.
+constexpr std::int64_t REQUEST_TIMEOUT_MICROSECONDS = 240000000;
+
+} // namespace
+
+std::shared_ptr<SecurityTokenService> CreateSecurityTokenService(const SecurityTokenServiceConfig &config) {
+  auto requestBuilder = std::make_shared<const RequestBuilderImpl>(config.holderOfKeyConfig);
+  auto transport = std::make_shared<const HttpsClient>(
+      config.stsUrl, Tarvel::Ref<Tarvel::Ssl::SSLContext>(config.sslContext), config.sslParameter,
+      REQUEST_TIMEOUT_MICROSECONDS, config.useDomainControllerName);
+  auto responseHandler = std::make_shared<const ResponseHandlerImpl>();
+  return std::make_shared<SecurityTokenServiceImpl>(std::move(requestBuilder), std::move(transport),
+                                                    std::move(responseHandler), config.signingCertificates);
+}
+
+} // namespace SsoClient

@@ -1,0 +1,79 @@
+// SPDX-License-Identifier: Apache-2.0
+/// @file
+/// `SecurityTokenServiceImpl`, which takes each operation down one road through its collaborators.
+
+#pragma once
+
+#include "exchange/request_builder.h"
+#include "exchange/response_handler.h"
+#include "exchange/transport.h"
+
+#include <ssoclient/security_token_service.h>
+#include <tarvel/core/ref.h>
+#include <tarvel/crypto/certificate.h>
+#include <tarvel/io/reader.h>
+
+#include <cstdint>
+#include <memory>
+#include <string>
+#include <vector>
+
+namespace SsoClient {
+
+/// Composes nothing, sends nothing and reads nothing itself. Copies share the collaborators, which therefore must be safe
+/// on any thread; queued work runs on a copy, so it outlives the service that it was given to.
+class SecurityTokenServiceImpl final : public SecurityTokenService {
+public:
+  SecurityTokenServiceImpl(std::shared_ptr<const RequestBuilder> requestBuilder,
+                           std::shared_ptr<const Transport> transport,
+                           std::shared_ptr<const ResponseHandler> responseHandler,
+                           const Tarvel::Crypto::CertificateList &signingCertificates);
+  SecurityTokenServiceImpl(const SecurityTokenServiceImpl &) = default;
+
+  std::shared_ptr<const SamlToken> AcquireToken(const std::string &username, const std::string &password,
+                                                const TokenSpec &spec) const override;
+  std::shared_ptr<const SamlToken> AcquireTokenByGSS(const TokenSpec &spec, NegotiationHandler &handler) const override;
+  std::shared_ptr<const SamlToken> AcquireTokenByCertificate(const TokenSpec &spec) const override;
+  std::shared_ptr<const SamlToken> AcquireTokenByToken(const SamlToken &token, const TokenSpec &spec) const override;
+  bool ValidateSubject(const SamlToken &token) const override;
+  std::shared_ptr<const SamlToken> RenewToken(const SamlToken &token, std::int64_t lifetimeSec) const override;
+
+  void AcquireTokenAsync(const std::string &username, const std::string &password, const TokenSpec &spec,
+                         const TokenCompletion &completion) const override;
+  void AcquireTokenByGssAsync(const TokenSpec &spec, const std::shared_ptr<NegotiationHandler> &handler,
+                              const TokenCompletion &completion) const override;
+  void AcquireTokenByCertificateAsync(const TokenSpec &spec, const TokenCompletion &completion) const override;
+  void AcquireTokenByTokenAsync(const std::shared_ptr<const SamlToken> &token, const TokenSpec &spec,
+                                const TokenCompletion &completion) const override;
+  void ValidateSubjectAsync(const std::shared_ptr<const SamlToken> &token,
+                            const ValidityCompletion &completion) const override;
+  void RenewTokenAsync(const std::shared_ptr<const SamlToken> &token, std::int64_t lifetimeSec,
+                       const TokenCompletion &completion) const override;
+
+  /// The verified token in `xml`; null when `xml` is empty.
+  /// @throws what `CreateSamlToken` throws, but SsoException in place of ParseException, with the same message.
+  std::shared_ptr<const SamlToken> ToSamlToken(const std::string &xml) const;
+
+  /// Sends the first leg of a negotiation and puts the service's answer into `spnego`.
+  void StartSPNegotiation(TransportSession &session, const std::vector<std::uint8_t> &leg, const TokenSpec &spec,
+                          SPNegoResponse &spnego) const;
+
+  /// The same for a later leg. `contextId` may be the text in `spnego`.
+  void ContinueSPNegotiation(TransportSession &session, const std::vector<std::uint8_t> &leg,
+                             const std::string &contextId, SPNegoResponse &spnego) const;
+
+private:
+  /// Posts on a session of its own, which is gone when this returns.
+  Tarvel::Ref<Tarvel::Reader> Send(const Request &request) const;
+  void SendLeg(TransportSession &session, const Request &request, SPNegoResponse &spnego) const;
+  /// Exchanges legs until the service issues a token or something throws.
+  void Negotiate(const TokenSpec &spec, NegotiationHandler &handler, SPNegoResponse &spnego) const;
+  std::shared_ptr<const SecurityTokenService> ShareCopy() const;
+
+  std::shared_ptr<const RequestBuilder> m_requestBuilder;
+  std::shared_ptr<const Transport> m_transport;
+  std::shared_ptr<const ResponseHandler> m_responseHandler;
+  Tarvel::Crypto::CertificateList m_signingCertificates;
+};
+
+} // namespace SsoClient

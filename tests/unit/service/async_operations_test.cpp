@@ -1,0 +1,314 @@
+// SPDX-License-Identifier: Apache-2.0
+#include "support/counting_token.h"
+#include "support/data_file.h"
+#include "support/recorded_log.h"
+#include "support/rendezvous.h"
+#include "support/service_stand_ins.h"
+#include "support/throws_message.h"
+
+#include <tarvel/system/thread_pool.h>
+
+#include <gtest/gtest.h>
+
+#include <algorithm>
+#include <functional>
+#include <memory>
+#include <mutex>
+#include <ostream>
+#include <set>
+#include <stdexcept>
+#include <string>
+#include <thread>
+#include <typeinfo>
+#include <vector>
+
+namespace SsoClient {
+namespace {
+
+using Testing::CountingToken;
+using Testing::EventCount;
+using Testing::Gate;
+using Testing::RecordedLog;
+using Testing::ServiceOn;
+using Testing::SpecFor;
+using Testing::TransportStandIn;
+using TokenPtr = std::shared_ptr<const SamlToken>;
+using Texts = std::vector<std::string>;
+
+/// How an operation ended, as its completion was told. Shared by the completions that it makes, which may outlive it.
+class Outcome {
+public:
+  SecurityTokenService::TokenCompletion ForToken() const {
+    return [state = m_state](const TokenPtr &token, const Tarvel::Exception *failure) {
+      state->Note(token ? token->GetSubject().ToString() : "null", failure);
+    };
+  }
+  SecurityTokenService::ValidityCompletion ForValidity() const {
+    return [state = m_state](const boost::optional<bool> &valid, const Tarvel::Exception *failure) {
+      state->Note(!valid ? "empty" : *valid ? "true" : "false", failure);
+    };
+  }
+
+  /// "RESULT" of a success, "RESULT and CLASS: MESSAGE" of a failure; one after the other.
+  Texts Wait(int count = 1) const {
+    EXPECT_TRUE(m_state->called.WaitFor(count));
+    const std::lock_guard<std::mutex> lock(m_state->mutex);
+    return m_state->results;
+  }
+
+  std::set<std::thread::id> Threads() const {
+    const std::lock_guard<std::mutex> lock(m_state->mutex);
+    return m_state->threads;
+  }
+
+private:
+  struct State {
+    void Note(const std::string &result, const Tarvel::Exception *failure) {
+      {
+        const std::lock_guard<std::mutex> lock(mutex);
+        results.push_back(result + (failure ? " and " + Describe(*failure) : ""));
+        threads.insert(std::this_thread::get_id());
+      }
+      called.Add();
+    }
+
+    static std::string Describe(const Tarvel::Exception &failure) {
+      const bool isCredentials = typeid(failure) == typeid(InvalidCredentialsException);
+      const bool isArgument = typeid(failure) == typeid(Tarvel::InvalidArgumentException);
+      return std::string(isCredentials ? "credentials"
+                         : isArgument  ? "argument"
+                                       : typeid(failure).name()) +
+             ": " + failure.what();
+    }
+
+    std::mutex mutex;
+    Texts results;
+    std::set<std::thread::id> threads;
+    EventCount called;
+  };
+
+  const std::shared_ptr<State> m_state = std::make_shared<State>();
+};
+
+/// Makes objects whose destruction is counted.
+template <typename T, typename... Args>
+std::shared_ptr<T> MakeCounted(const std::shared_ptr<EventCount> &destroyed, Args &&...args) {
+  return std::shared_ptr<T>(new T(std::forward<Args>(args)...), [destroyed](T *object) {
+    delete object;
+    destroyed->Add();
+  });
+}
+
+struct AsyncOperation {
+  const char *name;
+  const char *responseBegin;
+  bool yieldsToken;
+  const char *request;
+  std::function<void(const SecurityTokenService &, const TokenPtr &, const Outcome &)> start;
+};
+
+void PrintTo(const AsyncOperation &operation, std::ostream *out) {
+  *out << operation.name;
+}
+
+std::vector<AsyncOperation> AsyncOperations() {
+  using Service = SecurityTokenService;
+  return {
+      {"AcquireTokenAsync", "issued:", true, "1: UserPass alice pass 60",
+       [](const Service &service, const TokenPtr &, const Outcome &outcome) {
+         service.AcquireTokenAsync("alice", "pass", SpecFor(60), outcome.ForToken());
+       }},
+      {"AcquireTokenByGssAsync", "leg:context||", true, "1: InitialSPNego 60 hello",
+       [](const Service &service, const TokenPtr &, const Outcome &outcome) {
+         using Handler = Testing::NegotiationHandlerStandIn;
+         const std::vector<std::shared_ptr<Testing::Bytes>> script = {Testing::Leg("hello")};
+         service.AcquireTokenByGssAsync(SpecFor(60), std::make_shared<Handler>(script), outcome.ForToken());
+       }},
+      {"AcquireTokenByCertificateAsync", "issued:", true, "1: Certificate 60",
+       [](const Service &service, const TokenPtr &, const Outcome &outcome) {
+         service.AcquireTokenByCertificateAsync(SpecFor(60), outcome.ForToken());
+       }},
+      {"AcquireTokenByTokenAsync", "issued:", true, "1: Exchange 60",
+       [](const Service &service, const TokenPtr &token, const Outcome &outcome) {
+         service.AcquireTokenByTokenAsync(token, SpecFor(60), outcome.ForToken());
+       }},
+      {"ValidateSubjectAsync", "valid:true", false, "1: ValidateSubject",
+       [](const Service &service, const TokenPtr &token, const Outcome &outcome) {
+         service.ValidateSubjectAsync(token, outcome.ForValidity());
+       }},
+      {"RenewTokenAsync", "renewed:", true, "1: Renew 60",
+       [](const Service &service, const TokenPtr &token, const Outcome &outcome) {
+         service.RenewTokenAsync(token, 60, outcome.ForToken());
+       }},
+  };
+}
+
+class EachAsyncOperation : public testing::TestWithParam<AsyncOperation> {
+protected:
+  std::string Response() const {
+    return GetParam().responseBegin + (GetParam().yieldsToken ? Testing::ReadDataFile("tokens/bearer.xml") : "");
+  }
+  std::string Result() const { return GetParam().yieldsToken ? "{Name: alice; Domain:corp.example}" : "true"; }
+
+  const std::shared_ptr<EventCount> m_transportGone = std::make_shared<EventCount>();
+  const std::shared_ptr<EventCount> m_tokenGone = std::make_shared<EventCount>();
+};
+
+TEST_P(EachAsyncOperation, RunsOnAnotherThreadAndCallsBackOnceThere) {
+  const RecordedLog log;
+  auto transport =
+      MakeCounted<TransportStandIn>(m_transportGone, [response = Response()](const Request &) { return response; });
+  const Outcome outcome;
+  GetParam().start(*ServiceOn(transport), std::make_shared<CountingToken>(), outcome);
+  EXPECT_EQ(outcome.Wait(), Texts{Result()});
+  EXPECT_EQ(transport->Sent(), Texts{GetParam().request});
+  transport.reset();
+  ASSERT_TRUE(m_transportGone->WaitFor(1)); // the work item is over
+  EXPECT_EQ(outcome.Wait().size(), 1u);
+  EXPECT_EQ(outcome.Threads().count(std::this_thread::get_id()), 0u);
+  EXPECT_EQ(log.Threads(), outcome.Threads()); // from the first line on, it all ran there
+}
+
+TEST_P(EachAsyncOperation, KeepsWhatItNeedsUntilItIsDoneAndNoLonger) {
+  const auto gate = std::make_shared<Gate>();
+  auto transport = MakeCounted<TransportStandIn>(m_transportGone, [gate, response = Response()](const Request &) {
+    gate->Pass();
+    return response;
+  });
+  auto service = ServiceOn(transport);
+  TokenPtr token = MakeCounted<CountingToken>(m_tokenGone);
+  const Outcome outcome;
+  GetParam().start(*service, token, outcome);
+  service.reset();
+  transport.reset();
+  token.reset();
+  ASSERT_TRUE(gate->WaitForArrivals(1));
+  EXPECT_EQ(m_transportGone->Get(), 0);
+  gate->Open();
+  EXPECT_EQ(outcome.Wait(), Texts{Result()});
+  EXPECT_TRUE(m_transportGone->WaitFor(1));
+  EXPECT_TRUE(m_tokenGone->WaitFor(1));
+}
+
+TEST_P(EachAsyncOperation, ReportsAFailureOnceWithNothingButTheException) {
+  auto transport = MakeCounted<TransportStandIn>(m_transportGone, [](const Request &) { return "fault:refused"; });
+  const Outcome outcome;
+  GetParam().start(*ServiceOn(transport), std::make_shared<CountingToken>(), outcome);
+  transport.reset();
+  ASSERT_TRUE(m_transportGone->WaitFor(1));
+  EXPECT_EQ(outcome.Wait(),
+            Texts{std::string(GetParam().yieldsToken ? "null" : "empty") + " and credentials: refused"});
+  EXPECT_EQ(outcome.Threads().count(std::this_thread::get_id()), 0u);
+}
+
+TEST_P(EachAsyncOperation, LetsAnExceptionOfAnotherKindLeaveThePoolsItemWithoutCallingBack) {
+  const RecordedLog log;
+  const Testing::ScopedLogLevel level(63);
+  auto transport = MakeCounted<TransportStandIn>(
+      m_transportGone, [](const Request &) -> std::string { throw std::range_error("not ours"); });
+  const Outcome outcome;
+  GetParam().start(*ServiceOn(transport), std::make_shared<CountingToken>(), outcome);
+  transport.reset();
+  ASSERT_TRUE(m_transportGone->WaitFor(1));
+  ASSERT_TRUE(log.WaitForLines(1));
+  EXPECT_EQ(log.Lines(),
+            Texts{"Tarvel 8 An exception left a work item of the thread pool: std::range_error: not ours"});
+  EXPECT_EQ(outcome.Wait(0), Texts{});
+}
+
+INSTANTIATE_TEST_SUITE_P(SecurityTokenServiceImpl, EachAsyncOperation, testing::ValuesIn(AsyncOperations()),
+                         [](const auto &operation) { return std::string(operation.param.name); });
+
+std::shared_ptr<SecurityTokenServiceImpl> ServiceThatAnswers(const std::string &response) {
+  return ServiceOn(std::make_shared<TransportStandIn>([response](const Request &) { return response; }));
+}
+
+TEST(ValidateSubjectAsync, ReportsAnInvalidTokenAsAVerdictAndNotAsAFailure) {
+  const Outcome outcome;
+  ServiceThatAnswers("valid:false")->ValidateSubjectAsync(std::make_shared<CountingToken>(), outcome.ForValidity());
+  EXPECT_EQ(outcome.Wait(), Texts{"false"});
+}
+
+TEST(AcquireTokenAsync, ReportsNullAndNoExceptionWhenTheResponseHoldsNoToken) {
+  const Outcome outcome;
+  ServiceThatAnswers("issued:")->AcquireTokenAsync("alice", "pass", SpecFor(60), outcome.ForToken());
+  EXPECT_EQ(outcome.Wait(), Texts{"null"});
+}
+
+TEST(AsyncOperations, ReportAMissingTokenOrHandlerAsABadArgument) {
+  const auto service = ServiceThatAnswers("issued:");
+  const std::string failure = "and argument: Invalid argument : a required object may not be NULL";
+  const Outcome tokens;
+  service->AcquireTokenByTokenAsync(nullptr, SpecFor(60), tokens.ForToken());
+  service->RenewTokenAsync(nullptr, 60, tokens.ForToken());
+  service->AcquireTokenByGssAsync(SpecFor(60), nullptr, tokens.ForToken());
+  EXPECT_EQ(tokens.Wait(3), Texts(3, "null " + failure));
+  const Outcome verdict;
+  service->ValidateSubjectAsync(nullptr, verdict.ForValidity());
+  EXPECT_EQ(verdict.Wait(), Texts{"empty " + failure});
+}
+
+TEST(AsyncOperations, AreLoggedByThePoolWhenTheCompletionThrowsAndThePoolGoesOn) {
+  const RecordedLog log;
+  const Testing::ScopedLogLevel level(63);
+  const auto service = ServiceThatAnswers("issued:");
+  const auto refusing = ServiceThatAnswers("fault:refused");
+  const auto calls = std::make_shared<EventCount>();
+  const auto throwing = [calls](const TokenPtr &, const Tarvel::Exception *failure) {
+    calls->Add();
+    throw SsoException(failure ? "thrown on failure" : "thrown on success");
+  };
+  service->AcquireTokenByCertificateAsync(SpecFor(60), throwing);
+  ASSERT_TRUE(log.WaitForLines(1));
+  refusing->AcquireTokenByCertificateAsync(SpecFor(60), throwing);
+  ASSERT_TRUE(log.WaitForLines(2));
+  const std::string line = "Tarvel 8 An exception left a work item of the thread pool: SsoClient::SsoException: ";
+  EXPECT_EQ(log.Lines(), (Texts{line + "thrown on success", line + "thrown on failure"}));
+  EXPECT_EQ(calls->Get(), 2); // a Tarvel exception of the completion's own is not reported to it again
+  const Outcome outcome;
+  service->AcquireTokenByCertificateAsync(SpecFor(60), outcome.ForToken());
+  EXPECT_EQ(outcome.Wait(), Texts{"null"});
+}
+
+TEST(AsyncOperations, LeaveAnExceptionThatTheCompletionClonesToItsHolder) {
+  std::unique_ptr<const Tarvel::Exception> kept;
+  EventCount called;
+  ServiceThatAnswers("fault:refused")
+      ->AcquireTokenByCertificateAsync(SpecFor(60), [&](const TokenPtr &, const Tarvel::Exception *failure) {
+        kept.reset(failure->Clone());
+        called.Add();
+      });
+  ASSERT_TRUE(called.WaitFor(1));
+  EXPECT_THROWS_MESSAGE(kept->Throw(), InvalidCredentialsException, "refused");
+}
+
+TEST(AsyncOperations, CompleteAThousandThatWereInFlightWhenTheServiceStalled) {
+  constexpr int OPERATIONS = 1000;
+  const Testing::ScopedLogLevel level(63);
+  const auto gate = std::make_shared<Gate>();
+  const auto transport = std::make_shared<TransportStandIn>([gate](const Request &request) {
+    gate->Pass();
+    const std::string lifetime = request.body.substr(request.body.rfind(' ') + 1);
+    return lifetime == "0" ? std::string("fault:refused") : "issued:";
+  });
+  auto service = ServiceOn(transport);
+  const Outcome outcome;
+  for (int i = 0; i < OPERATIONS; ++i) {
+    service->AcquireTokenAsync("alice", "pass", SpecFor(i % 10), outcome.ForToken());
+  }
+  service.reset();
+  // The pool has no more threads than this; the others wait in its queue.
+  ASSERT_TRUE(gate->WaitForArrivals(Tarvel::System::DEFAULT_THREAD_CEILING));
+  EXPECT_EQ(outcome.Wait(0), Texts{});
+  gate->Open();
+  const Texts results = outcome.Wait(OPERATIONS);
+  EXPECT_EQ(results.size(), static_cast<std::size_t>(OPERATIONS));
+  EXPECT_EQ(std::count(results.begin(), results.end(), "null"), OPERATIONS * 9 / 10);
+  EXPECT_EQ(std::count(results.begin(), results.end(), "null and credentials: refused"), OPERATIONS / 10);
+  EXPECT_EQ(outcome.Threads().count(std::this_thread::get_id()), 0u);
+  EXPECT_EQ(transport->CountSessions(), OPERATIONS);
+  EXPECT_EQ(transport->CountOpenSessions(), 0);
+}
+
+} // namespace
+} // namespace SsoClient

@@ -1,0 +1,85 @@
+// SPDX-License-Identifier: Apache-2.0
+#include "support/identity.h"
+#include "support/posting_server.h"
+#include "support/soap_responses.h"
+#include "support/throws_message.h"
+
+#include <ssoclient/exceptions.h>
+#include <ssoclient/security_token_service.h>
+#include <tarvel/http/url.h>
+
+#include <gtest/gtest.h>
+
+#include <memory>
+#include <string>
+#include <vector>
+
+namespace SsoClient {
+namespace {
+
+using Testing::ConfigFor;
+using Testing::PostingServer;
+
+TokenSpec Spec() {
+  TokenSpec spec;
+  spec.tokenLifetimeSec = 60;
+  return spec;
+}
+
+std::string Issued() {
+  return Testing::IssueResponse(Testing::ReadDataFile("tokens/bearer.xml"));
+}
+
+TEST(CreateSecurityTokenService, MakesAServiceThatAcquiresTokensOverTlsAfterTheConfigurationIsGone) {
+  const PostingServer server({Issued()}, Testing::TlsSettings());
+  const auto context = Testing::ContextThatTrustsTheTestAuthority();
+  std::shared_ptr<const SecurityTokenService> service;
+  {
+    SecurityTokenServiceConfig config = ConfigFor(server.GetUrl());
+    config.sslContext = context.get();
+    service = CreateSecurityTokenService(config);
+  }
+  const auto token = service->AcquireToken("alice@corp.example", "pass", Spec());
+  ASSERT_NE(token, nullptr);
+  EXPECT_EQ(token->GetSubject().ToString(), "{Name: alice; Domain:corp.example}");
+  ASSERT_EQ(server.GetRequests().size(), 1u);
+  EXPECT_EQ(server.GetRequests()[0].rfind("POST /sts HTTP/1.1\r\n", 0), 0u);
+}
+
+TEST(CreateSecurityTokenService, GivesTheSslParameterToTheHandshake) {
+  const PostingServer server({Issued()}, Testing::TlsSettings());
+  const auto context = Testing::ContextThatTrustsTheTestAuthority();
+  SecurityTokenServiceConfig config = ConfigFor(server.GetUrl());
+  config.sslContext = context.get();
+  config.sslParameter = std::string(64, '0'); // the thumbprint of no certificate
+  EXPECT_THROW(CreateSecurityTokenService(config)->AcquireToken("alice@corp.example", "pass", Spec()),
+               CommunicationException);
+}
+
+TEST(CreateSecurityTokenService, GivesTheHolderOfKeyIdentityToTheRequests) {
+  const PostingServer server({Issued()});
+  SecurityTokenServiceConfig config = ConfigFor(server.GetUrl());
+  EXPECT_THROWS_MESSAGE(CreateSecurityTokenService(config)->AcquireTokenByCertificate(Spec()),
+                        Tarvel::InvalidStateException,
+                        "No HolderOfKeyConfig provided. Unable to acquire token by certificate");
+  config.holderOfKeyConfig = Testing::HolderIdentity();
+  EXPECT_NE(CreateSecurityTokenService(config)->AcquireTokenByCertificate(Spec()), nullptr);
+  EXPECT_NE(server.GetRequests().at(0).find("ds:SignatureValue"), std::string::npos);
+}
+
+TEST(CreateSecurityTokenService, RefusesHttpsWithoutAContextAndAnAddressThatIsNone) {
+  EXPECT_THROWS_MESSAGE(CreateSecurityTokenService(ConfigFor("https://localhost/")), Tarvel::InvalidArgumentException,
+                        "Invalid argument : HTTPS connection requested but no SSLContext provided.");
+  EXPECT_THROW(CreateSecurityTokenService(ConfigFor("localhost")), Tarvel::Http::MalformedURLException);
+}
+
+TEST(CreateSecurityTokenService, TakesAnEmptyListOfCertificatesThoughNoTokenWillBeAccepted) {
+  const PostingServer server({Issued()});
+  SecurityTokenServiceConfig config = ConfigFor(server.GetUrl());
+  config.signingCertificates.clear();
+  const auto service = CreateSecurityTokenService(config);
+  EXPECT_THROW(service->AcquireToken("alice@corp.example", "pass", Spec()), InvalidSignatureException);
+}
+
+} // namespace
+} // namespace SsoClient
