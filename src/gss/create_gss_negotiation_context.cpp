@@ -1,0 +1,29 @@
+// SPDX-License-Identifier: Apache-2.0
+#include "exchange/request_builder_impl.h"
+#include "exchange/response_handler_impl.h"
+#include "gss/gss_negotiation_context_impl.h"
+#include "transport/https_client.h"
+
+#include <tarvel/ssl/ssl_context.h>
+
+namespace SsoClient::InternalApi {
+
+namespace {
+
+/// 40 seconds: a leg is answered from what the service holds, so this is a sixth of what other requests may take.
+constexpr std::int64_t LEG_TIMEOUT_MICROSECONDS = 40000000;
+
+} // namespace
+
+std::shared_ptr<GssNegotiationContext> CreateGssNegotiationContext(const SecurityTokenServiceConfig &config,
+                                                                   const TokenSpec &spec) {
+  auto requestBuilder = std::make_shared<const RequestBuilderImpl>(config.holderOfKeyConfig);
+  // Without the flag: a negotiation goes to the very host that its tickets name.
+  const HttpsClient client(config.stsUrl, Tarvel::Ref<Tarvel::Ssl::SSLContext>(config.sslContext), config.sslParameter,
+                           LEG_TIMEOUT_MICROSECONDS);
+  auto responseHandler = std::make_shared<const ResponseHandlerImpl>();
+  return std::make_shared<GssNegotiationContextImpl>(spec, std::move(requestBuilder), client.CreateSession(),
+                                                     std::move(responseHandler), config.signingCertificates);
+}
+
+} // namespace SsoClient::InternalApi

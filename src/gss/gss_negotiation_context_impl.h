@@ -1,0 +1,43 @@
+// SPDX-License-Identifier: Apache-2.0
+/// @file
+/// `GssNegotiationContextImpl`, the one implementation of `GssNegotiationContext`.
+
+#pragma once
+
+#include "exchange/request_builder.h"
+#include "exchange/response_handler.h"
+#include "exchange/transport.h"
+
+#include <ssoclient/gss_negotiation_context.h>
+#include <tarvel/crypto/certificate.h>
+
+#include <cstdint>
+#include <memory>
+#include <string>
+#include <vector>
+
+namespace SsoClient::InternalApi {
+
+/// The first leg starts a negotiation; each later one continues it, as long as the service names its context.
+class GssNegotiationContextImpl final : public virtual GssNegotiationContext {
+public:
+  /// @throws Tarvel::InvalidArgumentException when there is no certificate: no token could be accepted at the end.
+  GssNegotiationContextImpl(const TokenSpec &spec, std::shared_ptr<const RequestBuilder> requestBuilder,
+                            std::shared_ptr<TransportSession> session,
+                            std::shared_ptr<const ResponseHandler> responseHandler,
+                            const Tarvel::Crypto::CertificateList &signingCertificates);
+
+  GssNegotiationResult NegotiateToken(const std::vector<std::uint8_t> &leg) override;
+
+private:
+  SPNegoResponse Exchange(const std::vector<std::uint8_t> &leg) const;
+
+  TokenSpec m_spec;
+  std::string m_contextId; // empty before the first leg, then what the service said last
+  std::shared_ptr<const RequestBuilder> m_requestBuilder;
+  std::shared_ptr<TransportSession> m_session;
+  std::shared_ptr<const ResponseHandler> m_responseHandler;
+  Tarvel::Crypto::CertificateList m_signingCertificates;
+};
+
+} // namespace SsoClient::InternalApi

@@ -1,0 +1,62 @@
+// SPDX-License-Identifier: Apache-2.0
+#include "support/posting_server.h"
+#include "support/soap_responses.h"
+#include "support/throws_message.h"
+
+#include <ssoclient/gss_negotiation_context.h>
+#include <tarvel/core/exception.h>
+#include <tarvel/http/url.h>
+
+#include <gtest/gtest.h>
+
+#include <memory>
+#include <string>
+#include <vector>
+
+namespace SsoClient::InternalApi {
+namespace {
+
+using Testing::ConfigFor;
+using Bytes = std::vector<std::uint8_t>;
+
+TokenSpec Spec() {
+  TokenSpec spec;
+  spec.tokenLifetimeSec = 60;
+  return spec;
+}
+
+TEST(CreateGssNegotiationContext, MakesAContextThatNegotiatesOverTlsAfterTheConfigurationIsGone) {
+  const Testing::PostingServer server({Testing::IntermediateLeg("ctx", "AQID"),
+                                       Testing::FinalLeg("ctx", "BAUG", Testing::ReadDataFile("tokens/bearer.xml"))},
+                                      Testing::TlsSettings());
+  const auto tls = Testing::ContextThatTrustsTheTestAuthority();
+  std::shared_ptr<GssNegotiationContext> context;
+  {
+    SecurityTokenServiceConfig config = ConfigFor(server.GetUrl());
+    config.sslContext = tls.get();
+    context = CreateGssNegotiationContext(config, Spec());
+  }
+  const GssNegotiationResult first = context->NegotiateToken({7});
+  EXPECT_EQ(*first.serverLeg, (Bytes{1, 2, 3}));
+  EXPECT_EQ(first.token, nullptr);
+  const GssNegotiationResult last = context->NegotiateToken({8});
+  EXPECT_EQ(*last.serverLeg, (Bytes{4, 5, 6}));
+  EXPECT_NE(last.token, nullptr);
+}
+
+TEST(CreateGssNegotiationContext, RefusesAConfigurationWithoutTrustedCertificates) {
+  SecurityTokenServiceConfig config = ConfigFor("http://localhost/");
+  config.signingCertificates.clear();
+  EXPECT_THROWS_MESSAGE(CreateGssNegotiationContext(config, Spec()), Tarvel::InvalidArgumentException,
+                        "Invalid argument : No STS trusted certificates provided");
+}
+
+TEST(CreateGssNegotiationContext, RefusesHttpsWithoutAContextAndAnAddressThatIsNone) {
+  EXPECT_THROWS_MESSAGE(CreateGssNegotiationContext(ConfigFor("https://localhost/"), Spec()),
+                        Tarvel::InvalidArgumentException,
+                        "Invalid argument : HTTPS connection requested but no SSLContext provided.");
+  EXPECT_THROW(CreateGssNegotiationContext(ConfigFor("localhost"), Spec()), Tarvel::Http::MalformedURLException);
+}
+
+} // namespace
+} // namespace SsoClient::InternalApi

@@ -1,0 +1,127 @@
+// SPDX-License-Identifier: Apache-2.0
+#include "gss/gss_negotiation_context_impl.h"
+
+#include "support/recorded_log.h"
+#include "support/service_stand_ins.h"
+#include "support/throws_message.h"
+
+#include <gtest/gtest.h>
+
+#include <memory>
+#include <string>
+#include <vector>
+
+namespace SsoClient::InternalApi {
+namespace {
+
+using Testing::Bytes;
+using Testing::ToBytes;
+using Texts = std::vector<std::string>;
+
+std::string Token(const std::string &name) {
+  return Testing::ReadDataFile("tokens/" + name + ".xml");
+}
+
+/// A context whose service answers one leg after the other.
+class GssNegotiation {
+public:
+  explicit GssNegotiation(Texts answers)
+      : m_transport(std::make_shared<Testing::TransportStandIn>(
+            [answers, next = std::make_shared<std::size_t>(0)](const Request &) { return answers.at((*next)++); })),
+        m_context(std::make_shared<GssNegotiationContextImpl>(
+            Testing::SpecFor(60), std::make_shared<const Testing::RequestBuilderStandIn>(),
+            m_transport->CreateSession(), std::make_shared<const Testing::ResponseHandlerStandIn>(),
+            Testing::TrustedCertificates())) {}
+
+  GssNegotiationResult Negotiate(const std::string &leg) const { return m_context->NegotiateToken(ToBytes(leg)); }
+  Texts Sent() const { return m_transport->Sent(); }
+  int CountSessions() const { return m_transport->CountSessions(); }
+
+private:
+  const std::shared_ptr<Testing::TransportStandIn> m_transport;
+  const std::shared_ptr<GssNegotiationContext> m_context;
+};
+
+TEST(GssNegotiationContext, StartsWithAnInitialLegAndContinuesInTheContextThatTheServiceNamedLast) {
+  const GssNegotiation negotiation({"leg:ctx1|s1|", "leg:ctx2|s2|", "leg:ctx2||" + Token("bearer")});
+  const GssNegotiationResult first = negotiation.Negotiate("c1");
+  EXPECT_EQ(*first.serverLeg, ToBytes("s1"));
+  EXPECT_EQ(first.token, nullptr);
+  EXPECT_EQ(*negotiation.Negotiate("c2").serverLeg, ToBytes("s2"));
+  EXPECT_NE(negotiation.Negotiate("c3").token, nullptr);
+  EXPECT_EQ(negotiation.Sent(),
+            (Texts{"1: InitialSPNego 60 c1", "1: ContinuedSPNego ctx1 c2", "1: ContinuedSPNego ctx2 c3"}));
+  EXPECT_EQ(negotiation.CountSessions(), 1);
+}
+
+TEST(GssNegotiationContext, ReturnsFinalServiceLegAndTokenInOneResult) {
+  const GssNegotiationResult result = GssNegotiation({"leg:ctx|final|" + Token("bearer")}).Negotiate("c1");
+  EXPECT_EQ(*result.serverLeg, ToBytes("final"));
+  ASSERT_NE(result.token, nullptr);
+  EXPECT_EQ(result.token->ToXml(), Token("bearer"));
+}
+
+TEST(GssNegotiationContext, StartsAgainWhenTheServiceNamedNoContext) {
+  const GssNegotiation negotiation({"leg:|s1|", "leg:ctx|s2|", "leg:|s3|", "leg:ctx|s4|"});
+  for (const char *leg : {"c1", "c2", "c3", "c4"}) {
+    negotiation.Negotiate(leg);
+  }
+  EXPECT_EQ(negotiation.Sent(), (Texts{"1: InitialSPNego 60 c1", "1: InitialSPNego 60 c2", "1: ContinuedSPNego ctx c3",
+                                       "1: InitialSPNego 60 c4"}));
+}
+
+TEST(GssNegotiationContext, ReturnsAListOfItsOwnForEachLegAndAnEmptyOneWhenTheServiceSentNone) {
+  const GssNegotiation negotiation({"leg:ctx||", "leg:ctx||"});
+  const GssNegotiationResult first = negotiation.Negotiate("");
+  const GssNegotiationResult second = negotiation.Negotiate("");
+  ASSERT_NE(first.serverLeg, nullptr);
+  EXPECT_EQ(*first.serverLeg, Bytes());
+  EXPECT_NE(first.serverLeg, second.serverLeg);
+}
+
+TEST(GssNegotiationContext, ContinuesAfterTheTokenInTheLastContext) {
+  const GssNegotiation negotiation({"leg:ctx||" + Token("bearer"), "leg:ctx|s2|"});
+  negotiation.Negotiate("c1");
+  negotiation.Negotiate("c2");
+  EXPECT_EQ(negotiation.Sent(), (Texts{"1: InitialSPNego 60 c1", "1: ContinuedSPNego ctx c2"}));
+}
+
+TEST(GssNegotiationContext, StaysInTheContextOfTheLastAnsweredLegWhenALegFails) {
+  const GssNegotiation negotiation({"fault:busy", "leg:ctx|s2|", "fault:busy", "leg:ctx|s4|"});
+  EXPECT_THROWS_MESSAGE(negotiation.Negotiate("c1"), InvalidCredentialsException, "busy");
+  negotiation.Negotiate("c2");
+  EXPECT_THROWS_MESSAGE(negotiation.Negotiate("c3"), InvalidCredentialsException, "busy");
+  negotiation.Negotiate("c4");
+  EXPECT_EQ(negotiation.Sent(), (Texts{"1: InitialSPNego 60 c1", "1: InitialSPNego 60 c2", "1: ContinuedSPNego ctx c3",
+                                       "1: ContinuedSPNego ctx c4"}));
+}
+
+TEST(GssNegotiationContext, LetsAParseExceptionOfTheTokenPassAsItIsWithTheContextNoted) {
+  const GssNegotiation negotiation({"leg:ctx||" + Token("expired"), "leg:ctx|s2|"});
+  EXPECT_THROWS_MESSAGE(negotiation.Negotiate("c1"), ParseException,
+                        "The token has expired at: 2021-01-01T00:00:00.000Z");
+  negotiation.Negotiate("c2");
+  EXPECT_EQ(negotiation.Sent(), (Texts{"1: InitialSPNego 60 c1", "1: ContinuedSPNego ctx c2"}));
+}
+
+TEST(GssNegotiationContext, LetsAWrongSignaturePassAsItIs) {
+  EXPECT_THROWS_MESSAGE(GssNegotiation({"leg:ctx||" + Token("signed-by-other")}).Negotiate("c1"),
+                        InvalidSignatureException, "Failed to verify signature: token might have been tampered with.");
+}
+
+TEST(GssNegotiationContext, WritesNoLogLine) {
+  const Testing::RecordedLog log;
+  GssNegotiation({"leg:ctx|final|" + Token("bearer")}).Negotiate("c1");
+  EXPECT_EQ(log.Lines(), Texts{});
+}
+
+TEST(GssNegotiationContext, IsRefusedWithoutTrustedCertificates) {
+  const Testing::TransportStandIn transport([](const Request &) { return std::string(); });
+  EXPECT_THROWS_MESSAGE(GssNegotiationContextImpl(
+                            Testing::SpecFor(60), std::make_shared<const Testing::RequestBuilderStandIn>(),
+                            transport.CreateSession(), std::make_shared<const Testing::ResponseHandlerStandIn>(), {}),
+                        Tarvel::InvalidArgumentException, "Invalid argument : No STS trusted certificates provided");
+}
+
+} // namespace
+} // namespace SsoClient::InternalApi
