@@ -41,22 +41,32 @@ bool IsHostCharacter(char c) noexcept {
   return IsDigit(c) || (c >= 'a' && c <= 'z') || (c >= 'A' && c <= 'Z') || c == '-' || c == '_';
 }
 
-/// The authority as it is written: what stands between "//" and the path, the query or the fragment.
+std::string_view UpToPath(std::string_view text) {
+  return text.substr(0, text.find_first_of("/?#"));
+}
+
+/// The authority as it is written: what stands between the scheme's "://" and the path, the query or the fragment.
 std::string_view FindAuthority(std::string_view url) {
-  const std::size_t start = url.find("//");
-  if (start == std::string_view::npos) {
+  constexpr std::string_view START = "://";
+  const std::size_t colon = url.find(':');
+  if (colon == std::string_view::npos || url.substr(colon, START.size()) != START) {
     return {};
   }
-  const std::string_view rest = url.substr(start + 2);
-  return rest.substr(0, rest.find_first_of("/?#"));
+  return UpToPath(url.substr(colon + START.size()));
+}
+
+/// Where user information stands, or would stand if the scheme were there, with the "@" after it; empty for none.
+std::string_view FindUserInformation(std::string_view url) {
+  const std::size_t slashes = url.find("//");
+  const std::string_view authority = UpToPath(slashes == std::string_view::npos ? url : url.substr(slashes + 2));
+  return authority.substr(0, authority.rfind('@') + 1);
 }
 
 /// `url` as a message may show it: without user information, which may hold a password, on one line and not endless.
 std::string Quote(std::string_view url) {
   std::string text(url);
-  const std::string_view authority = FindAuthority(url);
-  if (const std::size_t at = authority.rfind('@'); at != std::string_view::npos) {
-    text.replace(static_cast<std::size_t>(authority.data() - url.data()), at, "***");
+  if (const std::string_view user = FindUserInformation(url); !user.empty()) {
+    text.replace(static_cast<std::size_t>(user.data() - url.data()), user.size(), "***@");
   }
   std::replace_if(
       text.begin(), text.end(), [](char c) { return IsControlCharacter(c); }, '?');
