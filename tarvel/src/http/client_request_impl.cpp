@@ -49,7 +49,8 @@ std::string SerialiseHeader(const RequestData &request, std::string_view host, s
   if (!request.body.empty() || request.method == "POST" || request.method == "PUT") {
     AppendHeader(header, "Content-Length", std::to_string(request.body.size()));
   }
-  return header.append("\r\n");
+  header.append("\r\n");
+  return header;
 }
 
 } // namespace
@@ -62,7 +63,8 @@ std::string Serialise(const RequestData &request, std::string_view host, std::st
   const std::string header = SerialiseHeader(request, host, cookies);
   std::string message;
   message.reserve(header.size() + request.body.size()); // grown in between, it would leave copies of the body behind
-  return message.append(header).append(request.body);
+  message.append(header).append(request.body);
+  return message; // not what append returns, which would be copied
 }
 
 ClientRequestImpl::ClientRequestImpl(std::string_view method, std::string_view path) {

@@ -3,6 +3,7 @@
 // each piece of memory as it is given back.
 #include "compose/ws_security.h"
 #include "exchange/request_builder_impl.h"
+#include "integration/transport/service_stand_in.h"
 #include "service/wiped_text.h"
 #include "support/identity.h"
 #include "support/rendezvous.h"
@@ -185,6 +186,44 @@ TEST_P(FreedMemory, HoldsNoPasswordOfAnAsynchronousOperationThatIsOver) {
   service.reset();
   ASSERT_TRUE(over->WaitFor(1)); // the work releases the service after the password
   EXPECT_EQ(watch.Found(), 0);
+}
+
+/// Posts the secret, alone and in much else, to a service that never reads it: this process must hold no copy but ours.
+int CountFindsOfPosts(const char *secret, const Testing::ScriptedServer::Script &script,
+                      std::optional<Testing::TlsSettings> tls, std::int64_t timeout) {
+  Testing::ServiceStandIn service(script, tls, timeout);
+  const Watch watch(secret);
+  for (const std::string &padding : {std::string(), std::string(40000, 'x')}) {
+    auto request = std::make_unique<Request>(Testing::SampleRequest());
+    request->body.reserve(padding.size() + std::strlen(secret));
+    request->body.assign(padding).append(secret);
+    Testing::AskForOutcome(*service.CreateSession(), *request);
+  }
+  EXPECT_TRUE(Testing::DrainIoThreads());
+  return watch.Found();
+}
+
+TEST_P(FreedMemory, HoldsNoPasswordOfARequestThatWasSent) {
+  const auto answer = [](Testing::ServerConnection &connection) {
+    connection.ShakeHands();
+    connection.Write(Testing::Response("200 OK", "<answer/>"));
+    connection.WaitForInterrupt();
+  };
+  EXPECT_EQ(CountFindsOfPosts(GetParam(), answer, std::nullopt, Testing::NO_TIMEOUT), 0);
+  EXPECT_EQ(CountFindsOfPosts(GetParam(), answer, Testing::TlsSettings(), Testing::NO_TIMEOUT), 0);
+}
+
+TEST_P(FreedMemory, HoldsNoPasswordOfARequestThatFailed) {
+  constexpr std::int64_t SHORT = 200000; // microseconds
+  const auto stall = [](Testing::ServerConnection &connection) {
+    connection.ShakeHands();
+    connection.WaitForInterrupt();
+  };
+  const auto reset = [](Testing::ServerConnection &connection) { connection.Reset(); };
+  EXPECT_EQ(CountFindsOfPosts(GetParam(), stall, std::nullopt, SHORT), 0);
+  EXPECT_EQ(CountFindsOfPosts(GetParam(), stall, Testing::TlsSettings(), SHORT), 0);
+  EXPECT_EQ(CountFindsOfPosts(GetParam(), reset, std::nullopt, Testing::NO_TIMEOUT), 0);
+  EXPECT_EQ(CountFindsOfPosts(GetParam(), reset, Testing::TlsSettings(), Testing::NO_TIMEOUT), 0);
 }
 
 INSTANTIATE_TEST_SUITE_P(LongAndShort, FreedMemory, testing::Values(LONG_PASSWORD, SHORT_PASSWORD),

@@ -26,6 +26,7 @@ namespace {
 
 using Testing::Completion;
 using Testing::Eventually;
+using Testing::FullPort;
 using Testing::PATIENCE;
 using Testing::ScriptedServer;
 using Testing::ServerConnection;
@@ -50,41 +51,6 @@ std::string Read(const Ref<TcpClientSocket> &socket, std::size_t length = 100) {
   bytes.resize(read.GetCount());
   return bytes;
 }
-
-/// A port of loopback that takes no more connections: its queue is full, and nobody empties it.
-class FullPort {
-public:
-  FullPort() {
-    m_listener = ::socket(AF_INET, SOCK_STREAM | SOCK_CLOEXEC, 0);
-    sockaddr_in address{};
-    address.sin_family = AF_INET;
-    address.sin_addr.s_addr = htonl(INADDR_LOOPBACK);
-    socklen_t length = sizeof address;
-    ::bind(m_listener, reinterpret_cast<const sockaddr *>(&address), length);
-    ::listen(m_listener, 0);
-    ::getsockname(m_listener, reinterpret_cast<sockaddr *>(&address), &length);
-    m_port = ntohs(address.sin_port);
-    for (int i = 0; i < 8; ++i) {
-      const int filler = ::socket(AF_INET, SOCK_STREAM | SOCK_CLOEXEC | SOCK_NONBLOCK, 0);
-      ::connect(filler, reinterpret_cast<const sockaddr *>(&address), length);
-      m_fillers.push_back(filler);
-    }
-  }
-  FullPort(const FullPort &) = delete;
-  FullPort &operator=(const FullPort &) = delete;
-  ~FullPort() {
-    for (const int filler : m_fillers) {
-      ::close(filler);
-    }
-    ::close(m_listener);
-  }
-  int GetPort() const { return m_port; }
-
-private:
-  int m_listener = -1;
-  int m_port = 0;
-  std::vector<int> m_fillers;
-};
 
 void Echo(ServerConnection &connection) {
   for (std::string some = connection.ReadSome(); !some.empty(); some = connection.ReadSome()) {
