@@ -63,7 +63,7 @@ std::string CreateWssuId(ElementNode *element) {
   if (const auto *const existing = element->FindAttribute(Namespaces::WSU, "Id")) {
     return std::string(existing->GetValue());
   }
-  const std::string id = std::string(element->GetLocalName()) + Tarvel::StringUtil::GenerateUuid();
+  std::string id = std::string(element->GetLocalName()) + Tarvel::StringUtil::GenerateUuid();
   element->DefineAttribute("xmlns:wsu", Namespaces::WSU);
   element->DefineAttribute("wsu:Id", id);
   return id;
