@@ -1,7 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// URLs: what is accepted can be written again from its parts and gives the same parts; no part can end the line that it
-/// is sent in.
+/// URLs: what is accepted can be written again from its parts and gives the same parts; the host is what follows the
+/// scheme; no part can end the line that it is sent in.
 
 #include <tarvel/http/url.h>
 
@@ -59,11 +59,15 @@ std::string Write(const Parts &parts) {
 } // namespace
 
 extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t *data, std::size_t size) {
+  const std::string_view url(reinterpret_cast<const char *>(data), size);
   Parts parts;
-  if (!Parse({reinterpret_cast<const char *>(data), size}, parts)) {
+  if (!Parse(url, parts)) {
     return 0;
   }
   RequireSafe(parts);
+  const std::size_t schemeLength = parts.isSecure ? 5 : 4;
+  Require(url.substr(schemeLength, 3 + parts.host.size()) == "://" + parts.host ||
+          url.substr(schemeLength, 5 + parts.host.size()) == "://[" + parts.host + "]");
   Parts again;
   Require(Parse(Write(parts), again));
   Require(again.isSecure == parts.isSecure && again.host == parts.host);
