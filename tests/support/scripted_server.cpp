@@ -325,6 +325,13 @@ ScriptedServer::~ScriptedServer() {
   SSL_CTX_free(m_tls);
 }
 
+void ScriptedServer::ChangeTls(const TlsSettings &settings) {
+  SSL_CTX *const changed = CreateTls(settings);
+  const std::lock_guard<std::mutex> lock(m_mutex);
+  SSL_CTX_free(m_tls); // the connections that have it keep it
+  m_tls = changed;
+}
+
 void ScriptedServer::Accept() {
   BlockBrokenPipeSignal();
   pollfd listener{m_listener, POLLIN, 0};

@@ -111,6 +111,9 @@ public:
   /// Ends all connections and waits for their scripts.
   ~ScriptedServer();
 
+  /// What connections that are accepted from now on meet.
+  void ChangeTls(const TlsSettings &settings);
+
   int GetPort() const noexcept { return m_port; }
   /// How many connections have been accepted so far.
   int GetConnectionCount() const noexcept { return m_accepted; }
@@ -134,7 +137,7 @@ private:
   int m_listener = -1;
   std::atomic<int> m_accepted{0};
   std::atomic<bool> m_stopping{false};
-  mutable std::mutex m_mutex; // guards m_running
+  mutable std::mutex m_mutex; // guards m_running and, once there are connections, m_tls
   std::list<Running> m_running;
   std::thread m_acceptor;
 };
