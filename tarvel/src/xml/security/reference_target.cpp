@@ -4,6 +4,7 @@
 
 #include <tarvel/xml/security/exceptions.h>
 
+#include <algorithm>
 #include <string>
 
 namespace Tarvel::Xml::Security {
@@ -80,6 +81,11 @@ void NoteMatches(const ElementNode &element, const std::vector<Search> &searches
   }
 }
 
+/// The index of the first of the `uris` that is the one at `index`.
+std::size_t FirstEqual(const std::vector<std::string_view> &uris, std::size_t index) {
+  return static_cast<std::size_t>(std::find(uris.begin(), uris.end(), uris[index]) - uris.begin());
+}
+
 void RequireFound(const Search &search, const ElementNode &root) {
   if (!*search.target) {
     Refuse(search.uri, "no element has that identifier");
@@ -100,7 +106,10 @@ std::vector<const Node *> ResolveReferences(const ElementNode &root, const std::
       targets[index] = top;
       continue;
     }
-    searches.push_back({uris[index], RequireIdentifier(uris[index]), &targets[index]});
+    // Each identifier is searched for once, however many references repeat it.
+    if (FirstEqual(uris, index) == index) {
+      searches.push_back({uris[index], RequireIdentifier(uris[index]), &targets[index]});
+    }
   }
   if (!searches.empty()) {
     for (const Node *node = top; node; node = NextInDocument(node, top)) {
@@ -111,6 +120,9 @@ std::vector<const Node *> ResolveReferences(const ElementNode &root, const std::
   }
   for (const Search &search : searches) {
     RequireFound(search, root);
+  }
+  for (std::size_t index = 0; index < uris.size(); ++index) {
+    targets[index] = targets[FirstEqual(uris, index)];
   }
   return targets;
 }
