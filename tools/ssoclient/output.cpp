@@ -53,26 +53,35 @@ bool CanSteerTerminal(unsigned codePoint) {
          (codePoint >= 0x2066 && codePoint <= 0x2069);
 }
 
-/// The code point of one, two or three octets at the start of `text`; longer sequences are none that can steer.
 struct Decoded {
   unsigned codePoint;
   std::size_t length;
 };
 
-Decoded DecodeShort(std::string_view text) {
-  const auto octet = [&](std::size_t i) { return static_cast<unsigned char>(text[i]); };
-  if ((octet(0) & 0xE0u) == 0xC0u && text.size() >= 2) {
-    return {((octet(0) & 0x1Fu) << 6) | (octet(1) & 0x3Fu), 2};
+/// How many octets the lead octet of a UTF-8 sequence announces; 1 for every other octet.
+std::size_t AnnouncedLength(unsigned char lead) {
+  if (lead < 0xC2 || lead > 0xF4) {
+    return 1;
   }
-  if ((octet(0) & 0xF0u) == 0xE0u && text.size() >= 3) {
-    return {((octet(0) & 0x0Fu) << 12) | ((octet(1) & 0x3Fu) << 6) | (octet(2) & 0x3Fu), 3};
-  }
-  // Also a lone octet of a name that is not UTF-8: it stands for itself, and the C1 controls among them are escaped.
-  return {octet(0), 1};
+  return lead < 0xE0 ? 2 : lead < 0xF0 ? 3 : 4;
 }
 
-std::size_t LengthOfLongSequence(std::string_view text) {
-  return (static_cast<unsigned char>(text[0]) & 0xF8u) == 0xF0u && text.size() >= 4 ? 4 : 0;
+/// The first code point of `text`. An octet that begins no complete sequence, as in a name that is not UTF-8, stands for
+/// itself, so that a control character behind it is seen.
+Decoded DecodeFirst(std::string_view text) {
+  const auto octet = [&](std::size_t i) { return static_cast<unsigned char>(text[i]); };
+  const std::size_t length = AnnouncedLength(octet(0));
+  if (length == 1 || length > text.size()) {
+    return {octet(0), 1};
+  }
+  unsigned codePoint = octet(0) & (0x7Fu >> length);
+  for (std::size_t i = 1; i < length; ++i) {
+    if ((octet(i) & 0xC0u) != 0x80u) {
+      return {octet(0), 1};
+    }
+    codePoint = (codePoint << 6) | (octet(i) & 0x3Fu);
+  }
+  return {codePoint, length};
 }
 
 std::string Json(const nlohmann::ordered_json &value) {
@@ -85,8 +94,7 @@ std::string Json(const nlohmann::ordered_json &value) {
 std::string Printable(std::string_view text) {
   std::string out;
   while (!text.empty()) {
-    const std::size_t longLength = LengthOfLongSequence(text);
-    const Decoded decoded = longLength ? Decoded{0x10000, longLength} : DecodeShort(text);
+    const Decoded decoded = DecodeFirst(text);
     if (CanSteerTerminal(decoded.codePoint)) {
       std::array<char, 8> escaped{};
       std::snprintf(escaped.data(), escaped.size(), "\\u%04X", decoded.codePoint);

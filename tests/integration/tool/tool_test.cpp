@@ -398,6 +398,14 @@ TEST(Inspect, ShowsControlCharactersInsteadOfObeyingThem) {
       << json.out;
 }
 
+TEST(Tool, ShowsControlCharactersBehindOctetsThatAreNoUtf8) {
+  // Each lead octet announces more than follows, and must not take the escape character for a part of it.
+  const std::string name = "missing\xC3\x1B[2J\xE2\x80\x1B[2J\xF0\x1B[2J\xF0\x9F\x1B";
+  ExpectResult(RunTool({"inspect", name}), 7, "",
+               "ssoclient: file: missing\xC3\\u001B[2J\xE2\\u0080\\u001B[2J\xF0\\u001B[2J\xF0\\u009F\\u001B: "
+               "No such file or directory\n");
+}
+
 TEST(Tool, RefusesADocumentBeyondTheLimitWithoutReadingItAll) {
   // Twice the limit; what is beyond it is not read, and the feeding end may break.
   const Result result = RunTool({"inspect", "-"}, "<x>" + std::string(32u * 1024 * 1024, 'a'));
