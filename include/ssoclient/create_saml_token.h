@@ -19,12 +19,10 @@ namespace SsoClient {
 constexpr std::int64_t DEFAULT_CLOCK_TOLERANCE_SEC = 600;
 
 /// Parses, checks and verifies the SAML 2.0 assertion in `xml`. The token's `ToXml` is `xml`, byte for byte.
-/// @param trustedCertificates the keys that the token may be signed with. Trust is in the key: the validity dates of
-/// these
+/// @param trustedCertificates the keys that the token may be signed with. Trust is in the key: the validity dates of the
 ///        certificates are not judged. A null reference in the list trusts nothing.
 /// @param clockToleranceSec how far this machine's clock may be off, in seconds; a negative one narrows the window in
-/// which
-///        a token is accepted.
+///        which a token is accepted.
 /// @throws Tarvel::Xml::XMLParseException when `xml` is not a well-formed document.
 /// @throws ParseException when it is not an assertion of the accepted form, is inconsistent, expired or not valid yet.
 /// @throws InvalidSignatureException when none of the trusted keys made its signature, or it was changed since.
