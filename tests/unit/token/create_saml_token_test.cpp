@@ -9,6 +9,7 @@
 #include <ssoclient/exceptions.h>
 #include <tarvel/system/environment.h>
 #include <tarvel/xml/parser.h>
+#include <tarvel/xml/security/exceptions.h>
 
 #include <gtest/gtest.h>
 #include <libxml/c14n.h>
@@ -200,6 +201,13 @@ TEST_F(CreateSamlTokenTest, FromDomTakesAnAssertionWithinALargerDocument) {
   // Inclusive canonicalisation keeps the declarations in scope, and under exclusive ones the text verifies again.
   EXPECT_NE(std::string::npos, fromDom->ToXml().find("xmlns:e=\"urn:envelope\""));
   EXPECT_EQ(fromDom->GetId(), CreateSamlToken(fromDom->ToXml(), Trusted())->GetId());
+}
+
+TEST_F(CreateSamlTokenTest, FromDomPassesAnElementWithoutCanonicalFormOnAsThePlatformsException) {
+  const ParsedDocument document(
+      "<Assertion xmlns=\"urn:oasis:names:tc:SAML:2.0:assertion\"><none:Issuer/></Assertion>");
+  EXPECT_THROWS_MESSAGE(CreateSamlTokenFromDom(document.Root(), Trusted()), Tarvel::Xml::Security::XmlSecurityException,
+                        "No canonical form: the prefix \"none\" is not bound at line 1, column 58");
 }
 
 TEST_F(CreateSamlTokenTest, OutlivesTheDocumentItWasMadeFrom) {
