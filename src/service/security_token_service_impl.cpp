@@ -62,7 +62,7 @@ std::shared_ptr<const SamlToken> SecurityTokenServiceImpl::AcquireToken(const st
   Request request;
   m_requestBuilder->BuildUserPassTokenRequest(username, password, spec, request);
   LogOperation("SecurityTokenServiceImpl::AcquireToken sending request");
-  const Ref<Tarvel::Reader> response = Send(request);
+  const Ref<Tarvel::Reader> response = Send(std::move(request));
   LogOperation("SecurityTokenServiceImpl::AcquireToken processing response");
   std::string tokenXml;
   m_responseHandler->HandleAcquireTokenResponse(response.get(), tokenXml);
@@ -83,7 +83,7 @@ std::shared_ptr<const SamlToken> SecurityTokenServiceImpl::AcquireTokenByCertifi
   LogRequestedSpec(spec);
   Request request;
   m_requestBuilder->BuildCertificateTokenRequest(spec, request);
-  const Ref<Tarvel::Reader> response = Send(request);
+  const Ref<Tarvel::Reader> response = Send(std::move(request));
   std::string tokenXml;
   m_responseHandler->HandleAcquireTokenResponse(response.get(), tokenXml);
   return ToSamlToken(tokenXml);
@@ -97,7 +97,7 @@ std::shared_ptr<const SamlToken> SecurityTokenServiceImpl::AcquireTokenByToken(c
   }
   Request request;
   m_requestBuilder->BuildExchangeTokenRequest(token, spec, request);
-  const Ref<Tarvel::Reader> response = Send(request);
+  const Ref<Tarvel::Reader> response = Send(std::move(request));
   std::string tokenXml;
   m_responseHandler->HandleAcquireTokenResponse(response.get(), tokenXml);
   return ToSamlToken(tokenXml);
@@ -110,7 +110,7 @@ bool SecurityTokenServiceImpl::ValidateSubject(const SamlToken &token) const {
   }
   Request request;
   m_requestBuilder->BuildValidateSubjectRequest(token, request);
-  const Ref<Tarvel::Reader> response = Send(request);
+  const Ref<Tarvel::Reader> response = Send(std::move(request));
   const bool isValid = m_responseHandler->HandleValidateSubjectResponse(response.get());
   LogOperation("Result: %1", isValid);
   return isValid;
@@ -124,7 +124,7 @@ std::shared_ptr<const SamlToken> SecurityTokenServiceImpl::RenewToken(const Saml
   }
   Request request;
   m_requestBuilder->BuildRenewRequest(token, lifetimeSec, request);
-  const Ref<Tarvel::Reader> response = Send(request);
+  const Ref<Tarvel::Reader> response = Send(std::move(request));
   std::string tokenXml;
   m_responseHandler->HandleRenewTokenResponse(response.get(), tokenXml);
   return ToSamlToken(tokenXml);
@@ -160,7 +160,7 @@ void SecurityTokenServiceImpl::ContinueSPNegotiation(TransportSession &session, 
   SendLeg(session, request, spnego);
 }
 
-Ref<Tarvel::Reader> SecurityTokenServiceImpl::Send(const Request &request) const {
+Ref<Tarvel::Reader> SecurityTokenServiceImpl::Send(Request request) const {
   Ref<Tarvel::Reader> response;
   m_transport->CreateSession()->SendRequest(request, response);
   return response;

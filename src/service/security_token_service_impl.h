@@ -63,8 +63,9 @@ public:
                              const std::string &contextId, SPNegoResponse &spnego) const;
 
 private:
-  /// Posts on a session of its own, which is gone when this returns.
-  Tarvel::Ref<Tarvel::Reader> Send(const Request &request) const;
+  /// Posts on a session of its own. Session and request are gone when this returns, so that no password in the request
+  /// waits until the response has been judged.
+  Tarvel::Ref<Tarvel::Reader> Send(Request request) const;
   void SendLeg(TransportSession &session, const Request &request, SPNegoResponse &spnego) const;
   /// Exchanges legs until the service issues a token or something throws.
   void Negotiate(const TokenSpec &spec, NegotiationHandler &handler, SPNegoResponse &spnego) const;

@@ -28,6 +28,9 @@ namespace {
 std::atomic<const char *> g_secret{nullptr}; // not owned; null while nobody looks
 std::atomic<int> g_found{0};
 
+std::atomic<const void *> g_sentBody{nullptr}; // not owned; only compared, as it may be gone
+std::atomic<bool> g_isSentBodyFreed{false};
+
 void LookForSecret(const void *memory) noexcept {
   const char *const secret = g_secret.load();
   if (!secret || !memory) {
@@ -50,6 +53,9 @@ void *Allocate(std::size_t bytes) {
 
 void Free(void *memory) noexcept {
   LookForSecret(memory);
+  if (memory && memory == g_sentBody.load()) {
+    g_isSentBodyFreed = true;
+  }
   std::free(memory);
 }
 
@@ -111,7 +117,9 @@ public:
 private:
   class Session final : public TransportSession {
   public:
-    void SendRequest(const Request &, Tarvel::Ref<Tarvel::Reader> &response) override {
+    void SendRequest(const Request &request, Tarvel::Ref<Tarvel::Reader> &response) override {
+      g_isSentBodyFreed = false;
+      g_sentBody = request.body.data();
       response = Tarvel::CreateStringReader("issued:");
     }
     void SendRequestAsync(const Request &, const Completion &, Tarvel::Ref<Tarvel::System::ScheduledItem> &) override {}
@@ -154,6 +162,21 @@ TEST_P(FreedMemory, HoldsNoPasswordOfARequestThatCannotBeBuilt) {
                Tarvel::InvalidArgumentException);
   spec.delegateTo = std::string("\x01");
   EXPECT_THROW(builder.BuildUserPassTokenRequest("alice", password, spec, request), Tarvel::InvalidArgumentException);
+  EXPECT_EQ(watch.Found(), 0);
+}
+
+TEST_P(FreedMemory, HoldsTheWipedRequestBeforeTheResponseIsRead) {
+  const std::string password = GetParam();
+  const TokenSpec spec = Spec();
+  bool wasFreed = false;
+  const auto handler =
+      std::make_shared<const Testing::ResponseHandlerStandIn>([&wasFreed] { wasFreed = g_isSentBodyFreed; });
+  const SecurityTokenServiceImpl service(std::make_shared<const RequestBuilderImpl>(boost::none),
+                                         std::make_shared<const ForgetfulTransport>(), handler,
+                                         Tarvel::Crypto::CertificateList());
+  const Watch watch(GetParam());
+  service.AcquireToken("alice", password, spec);
+  EXPECT_TRUE(wasFreed);
   EXPECT_EQ(watch.Found(), 0);
 }
 
