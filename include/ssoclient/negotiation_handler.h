@@ -17,10 +17,10 @@ namespace SsoClient {
 class SSOCLIENT_API NegotiationHandler {
 public:
   /// Makes the client's next leg. Called on the thread that runs the operation, one call at a time.
-  /// @param serviceLeg what the service returned in the leg before; empty in the first call. Once the service has
-  /// issued
+  /// @param serviceLeg what the service returned in the leg before; empty in the first call. Once the service has issued
   ///        the token, there is one more call with the service's final leg when that leg is not empty.
-  /// @return the client's next leg, never null. What it throws passes through to whoever started the operation.
+  /// @return the client's next leg, never null; the answer to the final leg is not sent. What it throws passes through to
+  ///         whoever started the operation.
   virtual std::shared_ptr<std::vector<std::uint8_t>> NegotiateLeg(const std::vector<std::uint8_t> &serviceLeg) = 0;
 
 protected:
