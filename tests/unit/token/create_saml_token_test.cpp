@@ -235,13 +235,13 @@ TEST_F(CreateSamlTokenTest, RefusesADocumentThatIsNoAssertion) {
 }
 
 TEST_F(CreateSamlTokenTest, RefusesAChangedToken) {
-  for (const auto &[from, to] : std::vector<std::pair<std::string, std::string>>{
+  for (const auto &change : std::vector<std::pair<std::string, std::string>>{
            {">alice@corp.example<", ">mallory@corp.example<"},
            {"corp.example\\Users", "corp.example\\Owners"},
            {"AuthnInstant=\"2020-01-01T00:00:00.000Z\"", "AuthnInstant=\"2020-01-01T00:00:00.001Z\""},
            {"</saml:AttributeStatement>", "<saml:Attribute Name=\"x\"/></saml:AttributeStatement>"}}) {
-    EXPECT_THROWS_MESSAGE(CreateSamlToken(ReplaceOnce(Fixture("full"), from, to), Trusted()), InvalidSignatureException,
-                          TAMPERED);
+    EXPECT_THROWS_MESSAGE(CreateSamlToken(ReplaceOnce(Fixture("full"), change.first, change.second), Trusted()),
+                          InvalidSignatureException, TAMPERED);
   }
 }
 
