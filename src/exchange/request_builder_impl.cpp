@@ -155,6 +155,7 @@ void ValidateTokenIsHok(const SamlToken &token, const std::string &actionName) {
   }
 }
 
+// NOLINTNEXTLINE(performance-unnecessary-value-param): callers hand over a copy of their own.
 TokenSpec::Confirmation ConfOverrideWithDelegate(TokenSpec spec) {
   return spec.delegateTo ? TokenSpec::CONFIRMATION_NONE : spec.confirmation;
 }

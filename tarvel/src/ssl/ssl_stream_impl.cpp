@@ -299,7 +299,7 @@ int SSLStreamImpl::OnVerifyServer(X509_STORE_CTX *verification, void *) noexcept
 /// Why the server's certificate is not accepted; empty when it is.
 std::string SSLStreamImpl::VerifyServer(X509_STORE_CTX *verification) const {
   if (m_identity->HasThumbprint()) {
-    const std::string refusal = m_identity->RefuseByThumbprint(X509_STORE_CTX_get0_cert(verification));
+    std::string refusal = m_identity->RefuseByThumbprint(X509_STORE_CTX_get0_cert(verification));
     X509_STORE_CTX_set_error(verification, refusal.empty() ? X509_V_OK : X509_V_ERR_APPLICATION_VERIFICATION);
     return refusal;
   }
