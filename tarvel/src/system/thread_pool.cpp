@@ -105,7 +105,7 @@ Ref<WorkItem> WaitForWork(PoolState &pool, std::unique_lock<std::mutex> &lock) {
   if (pool.ended || pool.queue.empty()) {
     return {};
   }
-  const Ref<WorkItem> item = pool.queue.front();
+  Ref<WorkItem> item = pool.queue.front();
   item->TakeOutOfQueue();
   return item;
 }
