@@ -2,7 +2,7 @@
 /// @file
 /// Building signed requests, beside the one signature that none can do without.
 
-#include "median_reporter.h"
+#include "program.h"
 
 #include "exchange/request_builder_impl.h"
 
@@ -15,12 +15,8 @@
 
 #include <array>
 #include <cstdio>
-#include <cstdlib>
-#include <exception>
-#include <fstream>
-#include <iostream>
-#include <iterator>
 #include <memory>
+#include <ostream>
 #include <stdexcept>
 #include <string>
 #include <vector>
@@ -31,14 +27,6 @@ namespace {
 
 const std::string KEY_FILE = TOKEN_DATA_DIR "/holder.key"; // RSA-2048
 constexpr std::size_t RSA_2048_BYTES = 256;
-
-std::string ReadFile(const std::string &path) {
-  std::ifstream file(path, std::ios::binary);
-  if (!file) {
-    throw std::runtime_error("cannot read " + path);
-  }
-  return {std::istreambuf_iterator<char>(file), {}};
-}
 
 /// What requests are built from, made once, as a service makes it.
 struct Client {
@@ -113,7 +101,13 @@ void SignBare(benchmark::State &state) {
   }
 }
 
-// One object, its members on lines of their own between the braces'. Times are microseconds of the measuring thread's CPU.
+void RegisterBenchmarks() {
+  benchmark::RegisterBenchmark("Limit", SignBare)->Unit(benchmark::kMicrosecond);
+  benchmark::RegisterBenchmark("BuildCertificateTokenRequest", BuildIssue)->Unit(benchmark::kMicrosecond);
+  benchmark::RegisterBenchmark("BuildExchangeTokenRequest/5k", BuildExchange)->Unit(benchmark::kMicrosecond);
+}
+
+// Times are microseconds of the measuring thread's CPU.
 void WriteSummary(const Medians &medians, std::ostream &out) {
   const double limit = medians.at("Limit").cpuUs;
   const double issue = medians.at("BuildCertificateTokenRequest").cpuUs;
@@ -123,33 +117,12 @@ void WriteSummary(const Medians &medians, std::ostream &out) {
       << ", \"ratio\": " << exchange / limit << "}}\n}\n";
 }
 
-void Main(std::vector<std::string> arguments) {
-  const std::string json = TakeOption(arguments, "--json");
-  benchmark::RegisterBenchmark("Limit", SignBare)->Unit(benchmark::kMicrosecond);
-  benchmark::RegisterBenchmark("BuildCertificateTokenRequest", BuildIssue)->Unit(benchmark::kMicrosecond);
-  benchmark::RegisterBenchmark("BuildExchangeTokenRequest/5k", BuildExchange)->Unit(benchmark::kMicrosecond);
-  const Medians medians = RunInterleaved(arguments);
-  if (json.empty()) {
-    WriteSummary(medians, std::cout);
-    return;
-  }
-  std::ofstream file(json);
-  WriteSummary(medians, file);
-  if (!file.flush()) {
-    throw std::runtime_error("cannot write " + json);
-  }
-}
-
 } // namespace
+
+constexpr Program PROGRAM{"request_sign", RegisterBenchmarks, WriteSummary};
 
 } // namespace Bench
 
 int main(int argc, char **argv) {
-  try {
-    Bench::Main({argv + 1, argv + argc});
-    return EXIT_SUCCESS;
-  } catch (const std::exception &error) {
-    std::cerr << "request_sign: " << error.what() << '\n';
-    return EXIT_FAILURE;
-  }
+  return Bench::RunProgram(Bench::PROGRAM, argc, argv);
 }

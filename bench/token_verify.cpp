@@ -2,7 +2,7 @@
 /// @file
 /// Verifying a token, beside the cryptography that no verification can do without, and beside xmlsec1.
 
-#include "median_reporter.h"
+#include "program.h"
 #include "xmlsec_verifier.h"
 
 #include <ssoclient/create_saml_token.h>
@@ -14,12 +14,8 @@
 
 #include <array>
 #include <cstdio>
-#include <cstdlib>
-#include <exception>
-#include <fstream>
-#include <iostream>
-#include <iterator>
 #include <memory>
+#include <ostream>
 #include <stdexcept>
 #include <string>
 #include <vector>
@@ -30,14 +26,6 @@ namespace {
 
 const std::string CERTIFICATE_FILE = TOKEN_DATA_DIR "/sts-rsa.crt";
 const std::string KEY_FILE = TOKEN_DATA_DIR "/sts-rsa.key";
-
-std::string ReadFile(const std::string &path) {
-  std::ifstream file(path, std::ios::binary);
-  if (!file) {
-    throw std::runtime_error("cannot read " + path);
-  }
-  return {std::istreambuf_iterator<char>(file), {}};
-}
 
 /// The tokens, read once. All are signed with the RSA-2048 key of `CERTIFICATE_FILE`, SHA-256 and exclusive C14N.
 struct Tokens {
@@ -163,7 +151,7 @@ double Scaling(const Medians &medians, const std::string &name) {
          medians.at(name + "/scaling/real_time/threads:2").wallUs;
 }
 
-// One object, its members on lines of their own between the braces'. Times are microseconds of the measuring thread's CPU.
+// Times are microseconds of the measuring thread's CPU.
 void WriteSummary(const Medians &medians, std::ostream &out) {
   const double ours = medians.at("CreateSamlToken/5k").cpuUs;
   const double limit = medians.at("Limit/5k").cpuUs;
@@ -181,31 +169,12 @@ void WriteSummary(const Medians &medians, std::ostream &out) {
       << ", \"5m_ns_per_byte\": " << nanosecondsPerByte("CreateSamlToken/5m", tokens.large) << "}}\n}\n";
 }
 
-void Main(std::vector<std::string> arguments) {
-  const std::string json = TakeOption(arguments, "--json");
-  RegisterBenchmarks();
-  const Medians medians = RunInterleaved(arguments);
-  if (json.empty()) {
-    WriteSummary(medians, std::cout);
-    return;
-  }
-  std::ofstream file(json);
-  WriteSummary(medians, file);
-  if (!file.flush()) {
-    throw std::runtime_error("cannot write " + json);
-  }
-}
-
 } // namespace
+
+constexpr Program PROGRAM{"token_verify", RegisterBenchmarks, WriteSummary};
 
 } // namespace Bench
 
 int main(int argc, char **argv) {
-  try {
-    Bench::Main({argv + 1, argv + argc});
-    return EXIT_SUCCESS;
-  } catch (const std::exception &error) {
-    std::cerr << "token_verify: " << error.what() << '\n';
-    return EXIT_FAILURE;
-  }
+  return Bench::RunProgram(Bench::PROGRAM, argc, argv);
 }

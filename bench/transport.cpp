@@ -4,74 +4,33 @@
 /// server: with full handshakes, and with resumed ones. Wall time, as the caller waits it out; the server runs in this
 /// process and its share is in both figures.
 
-#include "median_reporter.h"
+#include "canned_server.h"
+#include "curl_client.h"
+#include "program.h"
 
-#include "support/scripted_server.h"
 #include "transport/https_client.h"
 
 #include <benchmark/benchmark.h>
-#include <curl/curl.h>
 
-#include <cstdlib>
-#include <exception>
-#include <fstream>
-#include <iostream>
-#include <memory>
-#include <stdexcept>
+#include <ostream>
 #include <string>
-#include <vector>
 
 namespace Bench {
 
 namespace {
 
-using Testing::ScriptedServer;
-using Testing::ServerConnection;
-using Testing::TlsSettings;
-
-const std::string AUTHORITY_FILE = TEST_DATA_DIR "/tls/authority.crt";
 const std::string BODY(4096, 'x');
-constexpr long TIMEOUT_SECONDS = 240;
-constexpr char FULL = 'f';
-constexpr char RESUMED = 'r';
+constexpr std::int64_t TIMEOUT_MICROSECONDS = 240000000;
 
-/// Answers with 4 KB that begin with how the handshake went.
-void Answer(ServerConnection &connection) {
-  if (connection.ShakeHands()) {
-    connection.ReadRequest();
-    std::string body = BODY;
-    body.front() = connection.WasResumed() ? RESUMED : FULL;
-    connection.Write("HTTP/1.1 200 OK\r\nContent-Type: text/xml\r\nContent-Length: 4096\r\nConnection: close\r\n\r\n" +
-                     body);
-  }
-}
-
-class Service {
-public:
-  explicit Service(bool resumes) : m_server(Answer, Settings(resumes)) {}
-
-  std::string GetUrl() const { return "https://localhost:" + std::to_string(m_server.GetPort()) + "/STS/trust"; }
-
-private:
-  static TlsSettings Settings(bool resumes) {
-    TlsSettings settings;
-    settings.resumesSessions = resumes;
-    return settings;
-  }
-
-  ScriptedServer m_server;
-};
-
-const std::string &GetUrl(bool resumes) {
-  static const Service full(false);
-  static const Service resumed(true);
-  static const std::string urls[] = {full.GetUrl(), resumed.GetUrl()};
-  return urls[resumes ? 1 : 0];
+const CannedServer &GetServer(bool resumes) {
+  static const CannedServer full(BODY, false);
+  static const CannedServer resumed(BODY, true);
+  return resumes ? resumed : full;
 }
 
 class OurClient {
 public:
-  explicit OurClient(const std::string &url) : m_client(url, TrustingContext(), "", TIMEOUT_SECONDS * 1000000) {
+  explicit OurClient(const std::string &url) : m_client(url, TrustingContext(), "", TIMEOUT_MICROSECONDS) {
     m_request.soapAction = SsoClient::Request::ISSUE;
     m_request.body = BODY;
   }
@@ -85,7 +44,7 @@ public:
 private:
   static Tarvel::Ref<Tarvel::Ssl::SSLContext> TrustingContext() {
     const Tarvel::Ref<Tarvel::Ssl::SSLContext> context = Tarvel::Ssl::CreateSSLContext();
-    context->TrustFile(AUTHORITY_FILE);
+    context->TrustFile(CannedServer::AUTHORITY_FILE);
     return context;
   }
 
@@ -93,67 +52,26 @@ private:
   SsoClient::Request m_request;
 };
 
-/// libcurl as a host that knows it well would use it: one handle for all requests, which keeps the parsed authorities and
-/// the sessions.
-class CurlClient {
+class Libcurl : public CurlClient {
 public:
-  explicit CurlClient(const std::string &url) {
-    Set(CURLOPT_URL, url.c_str());
-    Set(CURLOPT_CAINFO, AUTHORITY_FILE.c_str());
-    Set(CURLOPT_CAPATH, static_cast<const char *>(nullptr));
-    Set(CURLOPT_TIMEOUT, TIMEOUT_SECONDS);
-    Set(CURLOPT_NOSIGNAL, 1L);
-    Set(CURLOPT_FRESH_CONNECT, 1L);
-    Set(CURLOPT_FORBID_REUSE, 1L);
-    Set(CURLOPT_HTTP_VERSION, static_cast<long>(CURL_HTTP_VERSION_1_1));
-    Set(CURLOPT_POSTFIELDS, BODY.c_str());
-    Set(CURLOPT_POSTFIELDSIZE, static_cast<long>(BODY.size()));
-    for (const char *header : {"Content-Type: text/xml", "SOAPAction: \"http://docs.oasis-open.org/\"",
-                               "User-Agent: tarvel", "Accept:", "Connection: close", "Expect:"}) {
-      m_headers.reset(curl_slist_append(m_headers.release(), header));
-    }
-    Set(CURLOPT_HTTPHEADER, m_headers.get());
-    Set(CURLOPT_WRITEFUNCTION, &CurlClient::Append);
-    Set(CURLOPT_WRITEDATA, &m_response);
-  }
-
-  std::string Post() {
-    m_response.clear();
-    if (const CURLcode code = curl_easy_perform(m_handle.get()); code != CURLE_OK) {
-      throw std::runtime_error(curl_easy_strerror(code));
-    }
-    return m_response;
-  }
-
-private:
-  template <typename T>
-  void Set(CURLoption option, T value) {
-    if (!m_handle || curl_easy_setopt(m_handle.get(), option, value) != CURLE_OK) {
-      throw std::runtime_error("libcurl does not take an option");
-    }
-  }
-
-  static std::size_t Append(const char *bytes, std::size_t size, std::size_t count, void *response) {
-    static_cast<std::string *>(response)->append(bytes, size * count);
-    return size * count;
-  }
-
-  std::unique_ptr<CURL, void (*)(CURL *)> m_handle{curl_easy_init(), &curl_easy_cleanup};
-  std::unique_ptr<curl_slist, void (*)(curl_slist *)> m_headers{nullptr, &curl_slist_free_all};
-  std::string m_response;
+  explicit Libcurl(const std::string &url)
+      : CurlClient(url, CannedServer::AUTHORITY_FILE, SsoClient::Request::ISSUE, BODY) {}
 };
 
 template <typename Client>
 void Post(benchmark::State &state, bool resumes) {
-  Client client(GetUrl(resumes));
+  const CannedServer &server = GetServer(resumes);
+  Client client(server.GetUrl());
   client.Post(); // after which there is a session to resume
-  const char expected = resumes ? RESUMED : FULL;
+  const int otherHandshakes = server.CountOtherHandshakes();
   for (auto _ : state) {
-    const std::string response = client.Post();
-    if (response.size() != BODY.size() || response.front() != expected) {
+    if (client.Post() != BODY) {
       state.SkipWithError("not the response that was asked for");
       return;
     }
+  }
+  if (server.CountOtherHandshakes() != otherHandshakes) {
+    state.SkipWithError("not the handshakes that were asked for");
   }
 }
 
@@ -162,9 +80,9 @@ void RegisterBenchmarks() {
     return benchmark::RegisterBenchmark(name, function, resumes)->Unit(benchmark::kMicrosecond)->UseRealTime();
   };
   add("ours/full", Post<OurClient>, false);
-  add("libcurl/full", Post<CurlClient>, false);
+  add("libcurl/full", Post<Libcurl>, false);
   add("ours/resumed", Post<OurClient>, true);
-  add("libcurl/resumed", Post<CurlClient>, true);
+  add("libcurl/resumed", Post<Libcurl>, true);
 }
 
 /// The members of one comparison.
@@ -175,8 +93,7 @@ void WriteComparison(const Medians &medians, const std::string &handshake, std::
       << "}";
 }
 
-// One object, its members on lines of their own between the braces'. Times are microseconds of wall time; the ratio is to
-// libcurl, as nobody knows the limit of the system's network.
+// Times are microseconds of wall time; the ratio is to libcurl, as nobody knows the limit of the system's network.
 void WriteSummary(const Medians &medians, std::ostream &out) {
   out << "{\n\"transport\": {";
   WriteComparison(medians, "full", out);
@@ -185,34 +102,12 @@ void WriteSummary(const Medians &medians, std::ostream &out) {
   out << "}}\n}\n";
 }
 
-void Main(std::vector<std::string> arguments) {
-  const std::string json = TakeOption(arguments, "--json");
-  if (curl_global_init(CURL_GLOBAL_DEFAULT) != CURLE_OK) {
-    throw std::runtime_error("libcurl does not start");
-  }
-  RegisterBenchmarks();
-  const Medians medians = RunInterleaved(arguments);
-  if (json.empty()) {
-    WriteSummary(medians, std::cout);
-    return;
-  }
-  std::ofstream file(json);
-  WriteSummary(medians, file);
-  if (!file.flush()) {
-    throw std::runtime_error("cannot write " + json);
-  }
-}
-
 } // namespace
+
+constexpr Program PROGRAM{"transport", RegisterBenchmarks, WriteSummary};
 
 } // namespace Bench
 
 int main(int argc, char **argv) {
-  try {
-    Bench::Main({argv + 1, argv + argc});
-    return EXIT_SUCCESS;
-  } catch (const std::exception &error) {
-    std::cerr << "transport: " << error.what() << '\n';
-    return EXIT_FAILURE;
-  }
+  return Bench::RunProgram(Bench::PROGRAM, argc, argv);
 }

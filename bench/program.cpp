@@ -1,9 +1,15 @@
 // SPDX-License-Identifier: Apache-2.0
 
-#include "median_reporter.h"
+#include "program.h"
 
 #include <algorithm>
+#include <cstdlib>
+#include <exception>
+#include <fstream>
+#include <iostream>
+#include <iterator>
 #include <stdexcept>
+#include <vector>
 
 namespace Bench {
 
@@ -31,8 +37,6 @@ private:
   Medians m_medians;
 };
 
-} // namespace
-
 Medians RunInterleaved(const std::vector<std::string> &arguments) {
   std::vector<std::string> all = {"bench", "--benchmark_enable_random_interleaving=true", "--benchmark_repetitions=21",
                                   "--benchmark_min_time=0.05", "--benchmark_report_aggregates_only=true"};
@@ -49,6 +53,7 @@ Medians RunInterleaved(const std::vector<std::string> &arguments) {
   return reporter.GetMedians();
 }
 
+/// The value of the option `name` ("--json"), which is taken out of `arguments`; empty without it.
 std::string TakeOption(std::vector<std::string> &arguments, const std::string &name) {
   const auto option = std::find(arguments.begin(), arguments.end(), name);
   if (option == arguments.end() || option + 1 == arguments.end()) {
@@ -57,6 +62,41 @@ std::string TakeOption(std::vector<std::string> &arguments, const std::string &n
   std::string value = *(option + 1);
   arguments.erase(option, option + 2);
   return value;
+}
+
+void Run(const Program &program, std::vector<std::string> arguments) {
+  const std::string json = TakeOption(arguments, "--json");
+  program.registerBenchmarks();
+  const Medians medians = RunInterleaved(arguments);
+  if (json.empty()) {
+    program.writeSummary(medians, std::cout);
+    return;
+  }
+  std::ofstream file(json);
+  program.writeSummary(medians, file);
+  if (!file.flush()) {
+    throw std::runtime_error("cannot write " + json);
+  }
+}
+
+} // namespace
+
+int RunProgram(const Program &program, int argc, char **argv) {
+  try {
+    Run(program, {argv + 1, argv + argc});
+    return EXIT_SUCCESS;
+  } catch (const std::exception &error) {
+    std::cerr << program.name << ": " << error.what() << '\n';
+    return EXIT_FAILURE;
+  }
+}
+
+std::string ReadFile(const std::string &path) {
+  std::ifstream file(path, std::ios::binary);
+  if (!file) {
+    throw std::runtime_error("cannot read " + path);
+  }
+  return {std::istreambuf_iterator<char>(file), {}};
 }
 
 } // namespace Bench

@@ -1,0 +1,38 @@
+// SPDX-License-Identifier: Apache-2.0
+/// @file
+/// The peer that an exchange is measured against: libcurl.
+
+#pragma once
+
+#include <curl/curl.h>
+
+#include <memory>
+#include <string>
+
+namespace Bench {
+
+/// Posts one SOAP request, again and again, each time over a new TLS connection. It is libcurl as a host that knows it well
+/// would use it: one handle for all requests, which keeps the parsed authorities and the sessions; the same headers and
+/// limits as ours. For one thread at a time.
+class CurlClient {
+public:
+  /// @param authorityFile PEM certificates that the server's must chain to.
+  /// @param soapAction without quotes.
+  CurlClient(const std::string &url, const std::string &authorityFile, const std::string &soapAction,
+             const std::string &body);
+
+  /// The body of the response, good until the next call. @throws std::runtime_error
+  const std::string &Post();
+
+private:
+  template <typename T>
+  void Set(CURLoption option, T value);
+  static std::size_t Append(const char *bytes, std::size_t size, std::size_t count, void *response);
+
+  const std::string m_body;
+  std::string m_response;
+  std::unique_ptr<curl_slist, void (*)(curl_slist *)> m_headers{nullptr, &curl_slist_free_all};
+  std::unique_ptr<CURL, void (*)(CURL *)> m_handle;
+};
+
+} // namespace Bench
