@@ -3,6 +3,7 @@
 #include "crypto/certificate_impl.h"
 
 #include "crypto/openssl_errors.h"
+#include "crypto/openssl_use.h"
 
 #include <tarvel/core/ref.h>
 
@@ -23,6 +24,9 @@ namespace {
 constexpr std::size_t MAX_CURVE_NAME_BYTES = 80;
 
 CertificateHandle Decode(const std::vector<std::uint8_t> &der) {
+  OpenSslUse::Prepare();
+  const OpenSslUse use;
+  use.Require();
   const OpenSslErrorScope errors;
   if (der.empty() || der.size() > static_cast<std::size_t>(std::numeric_limits<long>::max())) {
     throw CryptoException("Certificate of " + std::to_string(der.size()) + " bytes does not decode");
@@ -111,6 +115,8 @@ BioHandle NewMemoryBio() {
 std::string DescribeName(const X509_NAME *name) {
   // RFC 2253 allows UTF-8 as it is; OpenSSL's flags would have every byte of it escaped.
   constexpr unsigned long FLAGS = XN_FLAG_RFC2253 & ~static_cast<unsigned long>(ASN1_STRFLGS_ESC_MSB);
+  const OpenSslUse use;
+  use.Require();
   const OpenSslErrorScope errors;
   const BioHandle bio = NewMemoryBio();
   if (X509_NAME_print_ex(bio.get(), name, 0, FLAGS) < 0) {
@@ -123,6 +129,8 @@ std::string DescribeName(const X509_NAME *name) {
 
 CertificateImpl::CertificateImpl(const std::uint8_t *data, std::size_t length)
     : m_der(data, data + length), m_native(Decode(m_der)) {
+  const OpenSslUse use;
+  use.Require();
   RequireCanonical(m_native.get(), m_der);
   m_notBefore = ToUtcMicroseconds(X509_get0_notBefore(m_native.get()));
   m_notAfter = ToUtcMicroseconds(X509_get0_notAfter(m_native.get()));
@@ -156,6 +164,8 @@ std::string CertificateImpl::GetSha256Thumbprint() const {
 }
 
 std::string CertificateImpl::ToPem() const {
+  const OpenSslUse use;
+  use.Require();
   const OpenSslErrorScope errors;
   const BioHandle bio = NewMemoryBio();
   if (PEM_write_bio_X509(bio.get(), m_native.get()) != 1) {

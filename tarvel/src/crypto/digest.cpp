@@ -44,6 +44,7 @@ const EVP_MD *GetDigestMethod(DigestAlgorithm algorithm) {
 }
 
 Digest::Digest(DigestAlgorithm algorithm) : m_context(nullptr) {
+  m_use.Require();
   const EVP_MD *const method = GetDigestMethod(algorithm);
   const OpenSslErrorScope errors;
   DigestContextHandle context(EVP_MD_CTX_new());

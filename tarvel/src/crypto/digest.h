@@ -4,6 +4,8 @@
 
 #pragma once
 
+#include "crypto/openssl_use.h"
+
 #include <cstddef>
 #include <cstdint>
 #include <memory>
@@ -22,7 +24,7 @@ constexpr std::size_t DigestBytes(DigestAlgorithm algorithm) noexcept {
 /// A digest in the making. For one thread.
 class Digest {
 public:
-  /// @throws CryptoException when the cryptographic library does not offer the algorithm.
+  /// @throws CryptoException when the cryptographic library does not offer the algorithm, or has cleaned itself up.
   explicit Digest(DigestAlgorithm algorithm);
   Digest(const Digest &) = delete;
   Digest &operator=(const Digest &) = delete;
@@ -34,6 +36,7 @@ public:
   void Finish(std::uint8_t *out);
 
 private:
+  const OpenSslUse m_use;
   void *m_context; // EVP_MD_CTX
 };
 

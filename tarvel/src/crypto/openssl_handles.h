@@ -1,8 +1,10 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// Owning handles for the objects of OpenSSL: each is freed when its handle goes.
+/// Owning handles for the objects of OpenSSL: each is freed when its handle goes, unless OpenSSL has cleaned itself up.
 
 #pragma once
+
+#include "crypto/openssl_use.h"
 
 #include <openssl/bio.h>
 #include <openssl/ec.h>
@@ -21,7 +23,11 @@ template <auto FREE>
 struct OpenSslDeleter {
   template <typename T>
   void operator()(T *handle) const noexcept {
-    FREE(handle);
+    if (const OpenSslUse use; use) {
+      FREE(handle);
+    } else {
+      OpenSslUse::Abandon(handle);
+    }
   }
 };
 

@@ -4,6 +4,8 @@
 
 #include "crypto/openssl_errors.h"
 
+#include <tarvel/crypto/certificate.h>
+
 #include <openssl/crypto.h>
 #include <openssl/ssl.h>
 
@@ -59,6 +61,12 @@ OpenSslUse::OpenSslUse() noexcept : m_isAllowed(TryBegin()) {}
 OpenSslUse::~OpenSslUse() {
   if (m_isAllowed) {
     uses.fetch_sub(1, std::memory_order_release);
+  }
+}
+
+void OpenSslUse::Require() const {
+  if (!m_isAllowed) {
+    throw CryptoException("OpenSSL has cleaned itself up: the process is about to end");
   }
 }
 

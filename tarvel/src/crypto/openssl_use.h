@@ -18,6 +18,9 @@ public:
   /// False once the clean-up has begun: then OpenSSL must not be called any more, not even to free what it made.
   explicit operator bool() const noexcept { return m_isAllowed; }
 
+  /// @throws CryptoException once the clean-up has begun.
+  void Require() const;
+
   /// Has OpenSSL tell of its clean-up. Called before the first use; any number of times.
   /// @throws CryptoException
   static void Prepare();

@@ -3,6 +3,7 @@
 #include "crypto/private_key_impl.h"
 
 #include "crypto/openssl_errors.h"
+#include "crypto/openssl_use.h"
 
 #include <typeinfo>
 #include <utility>
@@ -10,6 +11,7 @@
 namespace Tarvel::Crypto {
 
 PrivateKeyImpl::PrivateKeyImpl(KeyHandle native) : m_native(std::move(native)) {
+  OpenSslUse::Prepare();
   const OpenSslErrorScope errors;
   if (EVP_PKEY_is_a(m_native.get(), "RSA") || EVP_PKEY_is_a(m_native.get(), "EC")) {
     return;

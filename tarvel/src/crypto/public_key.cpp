@@ -6,6 +6,7 @@
 #include "crypto/digest_method.h"
 #include "crypto/openssl_errors.h"
 #include "crypto/openssl_handles.h"
+#include "crypto/openssl_use.h"
 #include "crypto/private_key_impl.h"
 
 #include <openssl/rsa.h>
@@ -127,6 +128,8 @@ bool VerifyDigest(const Certificate &certificate, SignatureScheme scheme, Digest
   if (!FitsScheme(impl.GetKeyKind(), scheme) || signatureLength != expectedLength) {
     return false;
   }
+  const OpenSslUse use;
+  use.Require();
   VerifyContexts &contexts = impl.GetVerifyContexts();
   KeyContextHandle context = contexts.Take(scheme, algorithm);
   if (!context) {
@@ -145,6 +148,8 @@ bool VerifyDigest(const Certificate &certificate, SignatureScheme scheme, Digest
 
 std::vector<std::uint8_t> SignDigest(const PrivateKey &key, SignatureScheme scheme, DigestAlgorithm algorithm,
                                      const std::uint8_t *digest) {
+  const OpenSslUse use;
+  use.Require();
   const OpenSslErrorScope errors;
   if (key.GetAlgorithm() != (IsRsaScheme(scheme) ? "RSA" : "EC")) {
     throw CryptoException("A key of algorithm " + key.GetAlgorithm() + " cannot make a signature of this scheme");

@@ -7,7 +7,7 @@ namespace Tarvel::Crypto {
 VerifyContexts::~VerifyContexts() {
   for (Slots &slots : m_slots) {
     for (std::atomic<EVP_PKEY_CTX *> &slot : slots) {
-      EVP_PKEY_CTX_free(slot.load(std::memory_order_relaxed));
+      const KeyContextHandle freed(slot.load(std::memory_order_relaxed));
     }
   }
 }
