@@ -1,0 +1,48 @@
+// SPDX-License-Identifier: Apache-2.0
+/// @file
+/// `CannedService`, a token service on loopback, over TLS, that judges nothing and gives the answer of each kind at once.
+
+#pragma once
+
+#include "support/posting_server.h"
+#include "support/scripted_server.h"
+
+#include <ssoclient/saml_token.h>
+#include <ssoclient/security_token_service.h>
+#include <tarvel/ssl/ssl_context.h>
+
+#include <functional>
+#include <memory>
+#include <string>
+
+namespace Testing {
+
+/// For what is tested with more requests, or more at a time, than a service that judges them would bear.
+class CannedService {
+public:
+  /// @param beforeAnswer runs for each request, on a thread of its own, before it is answered
+  explicit CannedService(std::function<void()> beforeAnswer = [] {});
+
+  /// What describes the service, with a holder-of-key identity. The TLS context is the service's.
+  SsoClient::SecurityTokenServiceConfig GetConfig() const;
+
+  /// How many connections the service has accepted.
+  int CountConnections() const { return m_server.GetConnectionCount(); }
+  /// How many of them it has not ended yet.
+  std::size_t CountOpenConnections() const { return m_server.GetOpenCount(); }
+
+private:
+  void Serve(ServerConnection &peer) const;
+
+  const std::function<void()> m_beforeAnswer;
+  const std::string m_issued;
+  const std::string m_renewed;
+  const std::string m_valid;
+  const Tarvel::Ref<Tarvel::Ssl::SSLContext> m_context;
+  ScriptedServer m_server; // last: its scripts use the rest
+};
+
+/// A holder-of-key token of the identity in `CannedService::GetConfig`.
+std::shared_ptr<const SsoClient::SamlToken> HeldToken();
+
+} // namespace Testing
