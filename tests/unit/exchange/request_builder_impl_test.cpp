@@ -6,6 +6,7 @@
 #include "support/token_stand_in.h"
 
 #include <tarvel/core/exception.h>
+#include <tarvel/xml/parser.h>
 
 #include <gtest/gtest.h>
 
@@ -221,7 +222,9 @@ TEST_F(RequestBuilderImplTest, AValidateRequestIsNotSignedEvenWithAnIdentity) {
 
 TEST_F(RequestBuilderImplTest, AFailureWhileComposingLeavesTheBodyAsItWas) {
   m_request.body = "earlier";
-  EXPECT_ANY_THROW(m_plain.BuildValidateSubjectRequest(UNPARSABLE_BEARER_TOKEN, m_request));
+  EXPECT_THROWS_MESSAGE(m_plain.BuildValidateSubjectRequest(UNPARSABLE_BEARER_TOKEN, m_request),
+                        Tarvel::Xml::XMLParseException,
+                        "Specification mandates value for attribute xml at line 1, column 9");
   EXPECT_EQ(m_request.soapAction, Request::VALIDATE);
   EXPECT_EQ(m_request.body, "earlier");
 }

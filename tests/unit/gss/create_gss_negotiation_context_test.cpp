@@ -55,7 +55,9 @@ TEST(CreateGssNegotiationContext, RefusesHttpsWithoutAContextAndAnAddressThatIsN
   EXPECT_THROWS_MESSAGE(CreateGssNegotiationContext(ConfigFor("https://localhost/"), Spec()),
                         Tarvel::InvalidArgumentException,
                         "Invalid argument : HTTPS connection requested but no SSLContext provided.");
-  EXPECT_THROW(CreateGssNegotiationContext(ConfigFor("localhost"), Spec()), Tarvel::Http::MalformedURLException);
+  EXPECT_THROWS_MESSAGE(CreateGssNegotiationContext(ConfigFor("localhost"), Spec()),
+                        Tarvel::Http::MalformedURLException,
+                        "Malformed URL \"localhost\": the scheme is not http or https");
 }
 
 } // namespace

@@ -52,8 +52,11 @@ TEST(CreateSecurityTokenService, GivesTheSslParameterToTheHandshake) {
   SecurityTokenServiceConfig config = ConfigFor(server.GetUrl());
   config.sslContext = context.get();
   config.sslParameter = std::string(64, '0'); // the thumbprint of no certificate
-  EXPECT_THROW(CreateSecurityTokenService(config)->AcquireToken("alice@corp.example", "pass", Spec()),
-               CommunicationException);
+  const auto shown = Tarvel::Crypto::CreateCertificateFromPem(Testing::ReadDataFile("tls/localhost.crt"));
+  EXPECT_THROWS_MESSAGE(
+      CreateSecurityTokenService(config)->AcquireToken("alice@corp.example", "pass", Spec()), CommunicationException,
+      "The TLS handshake with localhost failed: the server's certificate has the SHA-256 thumbprint " +
+          shown->GetSha256Thumbprint() + " instead of " + config.sslParameter);
 }
 
 TEST(CreateSecurityTokenService, GivesTheHolderOfKeyIdentityToTheRequests) {
@@ -70,7 +73,8 @@ TEST(CreateSecurityTokenService, GivesTheHolderOfKeyIdentityToTheRequests) {
 TEST(CreateSecurityTokenService, RefusesHttpsWithoutAContextAndAnAddressThatIsNone) {
   EXPECT_THROWS_MESSAGE(CreateSecurityTokenService(ConfigFor("https://localhost/")), Tarvel::InvalidArgumentException,
                         "Invalid argument : HTTPS connection requested but no SSLContext provided.");
-  EXPECT_THROW(CreateSecurityTokenService(ConfigFor("localhost")), Tarvel::Http::MalformedURLException);
+  EXPECT_THROWS_MESSAGE(CreateSecurityTokenService(ConfigFor("localhost")), Tarvel::Http::MalformedURLException,
+                        "Malformed URL \"localhost\": the scheme is not http or https");
 }
 
 TEST(CreateSecurityTokenService, TakesAnEmptyListOfCertificatesThoughNoTokenWillBeAccepted) {
@@ -78,7 +82,9 @@ TEST(CreateSecurityTokenService, TakesAnEmptyListOfCertificatesThoughNoTokenWill
   SecurityTokenServiceConfig config = ConfigFor(server.GetUrl());
   config.signingCertificates.clear();
   const auto service = CreateSecurityTokenService(config);
-  EXPECT_THROW(service->AcquireToken("alice@corp.example", "pass", Spec()), InvalidSignatureException);
+  EXPECT_THROWS_MESSAGE(service->AcquireToken("alice@corp.example", "pass", Spec()), InvalidSignatureException,
+                        "Signature verification error. No trusted key can be used with the signature algorithm "
+                        "\"http://www.w3.org/2001/04/xmldsig-more#rsa-sha256\"");
 }
 
 } // namespace

@@ -5,6 +5,7 @@
 #include "support/fixed_environment.h"
 #include "support/recorded_log.h"
 #include "support/service_stand_ins.h"
+#include "support/throws_message.h"
 
 #include <gtest/gtest.h>
 
@@ -145,7 +146,7 @@ TEST_P(OperationLog, TellsStartRequestResultAndEndAndNothingSecret) {
 TEST_P(OperationLog, TellsStartRequestAndEndOfAnOperationThatFails) {
   const Testing::FixedEnvironment environment;
   const RecordedLog log;
-  EXPECT_THROW(Run("fault:refused"), InvalidCredentialsException);
+  EXPECT_THROWS_MESSAGE(Run("fault:refused"), InvalidCredentialsException, "refused");
   const Texts processing = std::string(GetParam().name) == "AcquireToken" ? GetParam().result : Texts{};
   EXPECT_EQ(log.Lines(), FrameOf(GetParam().name, {GetParam().request, processing}));
 }

@@ -101,7 +101,8 @@ TEST_P(EachTokenOperation, LetsAWrongSignaturePassAsItIs) {
 
 TEST_P(EachTokenOperation, LetsTheRefusalOfTextThatIsNotXmlPassAsItIs) {
   const AnsweringService answering(std::string(GetParam().responseBegin) + "no XML");
-  EXPECT_THROW(GetParam().run(*answering.service), Tarvel::Xml::XMLParseException);
+  EXPECT_THROWS_MESSAGE(GetParam().run(*answering.service), Tarvel::Xml::XMLParseException,
+                        "Start tag expected, '<' not found at line 1, column 1");
 }
 
 TEST_P(EachTokenOperation, LetsARefusalOfTheServicePassAsItIs) {
@@ -178,7 +179,9 @@ TEST(SecurityTokenServiceImpl, AcceptsNoTokenWithoutTrustedCertificates) {
       std::make_shared<TransportStandIn>([](const Request &) { return "issued:" + TokenXml("bearer"); });
   const SecurityTokenServiceImpl service(std::make_shared<const Testing::RequestBuilderStandIn>(), transport,
                                          std::make_shared<const Testing::ResponseHandlerStandIn>(), {});
-  EXPECT_THROW(service.AcquireTokenByCertificate(SpecFor(1)), InvalidSignatureException);
+  EXPECT_THROWS_MESSAGE(service.AcquireTokenByCertificate(SpecFor(1)), InvalidSignatureException,
+                        "Signature verification error. No trusted key can be used with the signature algorithm "
+                        "\"http://www.w3.org/2001/04/xmldsig-more#rsa-sha256\"");
 }
 
 } // namespace
