@@ -88,6 +88,11 @@ void HttpExchange::OnConnected(const Ref<System::Stream> &stream, const Exceptio
     Finish(failure, nullptr);
     return;
   }
+  if (!stream) {
+    const InvalidStateException nothing("A connection specification reported neither a stream nor a failure");
+    Finish(&nothing, nullptr);
+    return;
+  }
   Step([this, &stream] {
     Send(stream);
     Read(stream);

@@ -60,7 +60,7 @@ private:
 };
 
 /// Hands out one stream; without one it throws.
-class OneStreamSpec final : public CustomConnectionSpec {
+class OneStreamSpec : public CustomConnectionSpec {
 public:
   explicit OneStreamSpec(const Ref<System::Stream> &stream) : m_stream(stream) {}
 
@@ -191,6 +191,27 @@ TEST_F(UserAgentTest, RefusesWhatItCannotWorkWith) {
   EXPECT_THROWS_MESSAGE(
       CreateHttpUserAgent(MakeRef<OneStreamSpec>(nullptr), cookies, MakeRef<Pool>(), other), InvalidArgumentException,
       "Invalid argument : a user agent opens one connection for each request; connection pools are not offered.");
+}
+
+/// Says that it has connected, and has no stream to show for it.
+class EmptyHandedSpec final : public OneStreamSpec {
+public:
+  EmptyHandedSpec() : OneStreamSpec(nullptr) {}
+
+  Ref<System::ScheduledItem> AsyncConnect(ConnectCompletion completion) const override {
+    boost::asio::post(System::GetIoContext(), [completion] { completion(nullptr, nullptr); });
+    return nullptr;
+  }
+};
+
+TEST_F(UserAgentTest, ReportsASpecificationThatGivesNeitherAStreamNorAFailure) {
+  Ref<CookieStore> cookies;
+  CreateCookieStore("", cookies);
+  Ref<UserAgent> agent;
+  CreateHttpUserAgent(MakeRef<EmptyHandedSpec>(), cookies, nullptr, agent);
+  agent->StartRequest(Post(), nullptr, m_pending);
+  EXPECT_THROWS_MESSAGE(agent->WaitForRequest(m_pending, LONG, m_response), InvalidStateException,
+                        "A connection specification reported neither a stream nor a failure");
 }
 
 TEST_F(UserAgentTest, StartsARequestOnlyOnce) {
