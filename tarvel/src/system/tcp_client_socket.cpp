@@ -79,7 +79,7 @@ struct TcpClientSocketImpl::PendingWrite {
   TransferHandler handler;
 };
 
-TcpClientSocketImpl::TcpClientSocketImpl() : m_socket(GetIoContext()) {}
+TcpClientSocketImpl::TcpClientSocketImpl() : m_socket(GetIoContext()), m_attemptTimer(GetIoContext()) {}
 
 void TcpClientSocketImpl::AsyncConnect(const std::string &host, int port, ConnectHandler handler) {
   const std::lock_guard<std::mutex> lock(m_mutex);
@@ -146,11 +146,29 @@ void TcpClientSocketImpl::TryNextAddress() {
     if (OpenSocket(endpoint, error)) {
       m_socket.async_connect(endpoint,
                              [self = Ref(this)](const error_code &result) { self->OnConnectAttempt(result); });
+      LimitAttempt();
       return;
     }
     NoteFailedAttempt(error);
   }
   GiveUpConnect(m_attempts);
+}
+
+// An address that swallows packets must not use up the time that the others are worth.
+void TcpClientSocketImpl::LimitAttempt() {
+  m_isAttemptOverdue = false;
+  if (m_nextAddress == m_addresses.size()) {
+    return; // whoever asked for the connection limits the last one
+  }
+  m_attemptTimer.expires_after(MAX_ATTEMPT_TIME);
+  m_attemptTimer.async_wait([self = Ref(this), attempt = m_nextAddress](const error_code &cancelled) {
+    const std::lock_guard<std::mutex> lock(self->m_mutex);
+    if (!cancelled && self->m_stage == Stage::CONNECTING && self->m_nextAddress == attempt) {
+      self->m_isAttemptOverdue = true;
+      error_code ignored;
+      self->m_socket.cancel(ignored);
+    }
+  });
 }
 
 // Asio's own `open` would leave a moment in which another thread's new child process inherits the descriptor.
@@ -175,14 +193,15 @@ void TcpClientSocketImpl::OnConnectAttempt(const error_code &error) {
     if (m_stage != Stage::CONNECTING) {
       return; // closed meanwhile, and the handler told so
     }
+    error_code ignored;
+    m_attemptTimer.cancel(ignored);
     if (error) {
-      NoteFailedAttempt(error);
+      NoteFailedAttempt(m_isAttemptOverdue ? asio::error::make_error_code(asio::error::timed_out) : error);
       TryNextAddress();
       return;
     }
     m_stage = Stage::CONNECTED;
-    error_code ignored; // a connection that waits for full segments is slow, not wrong
-    m_socket.set_option(tcp::no_delay(true), ignored);
+    m_socket.set_option(tcp::no_delay(true), ignored); // without it the connection is slow, not wrong
     handler = std::move(m_connectHandler);
     m_connectHandler = nullptr;
   }
@@ -218,6 +237,7 @@ void TcpClientSocketImpl::Close() noexcept {
     m_stage = Stage::ENDED;
     error_code ignored; // the descriptor is gone in any case
     m_socket.close(ignored);
+    m_attemptTimer.cancel(ignored);
     handler.swap(m_connectHandler);
     lookup = std::move(m_lookup);
   }

@@ -9,13 +9,19 @@
 #include <tarvel/system/stream.h>
 
 #include <boost/asio/ip/tcp.hpp>
+#include <boost/asio/steady_timer.hpp>
 
+#include <chrono>
 #include <memory>
 #include <mutex>
 #include <string>
 #include <string_view>
 
 namespace Tarvel::System {
+
+/// How long an address of a name may leave the connect unanswered while there are further ones to try: long enough for
+/// two repetitions of a lost packet.
+constexpr std::chrono::seconds MAX_ATTEMPT_TIME{5};
 
 class TcpClientSocketImpl final : public TcpClientSocket {
 public:
@@ -41,6 +47,7 @@ private:
   void GiveUpConnect(const std::string &reason);
   bool OpenSocket(const boost::asio::ip::tcp::endpoint &endpoint, boost::system::error_code &error);
   void OnConnectAttempt(const boost::system::error_code &error);
+  void LimitAttempt();
   void NoteFailedAttempt(const boost::system::error_code &error);
 
   struct PendingWrite;
@@ -67,6 +74,8 @@ private:
   AddressList m_addresses;
   std::size_t m_nextAddress = 0;
   std::string m_attempts; // the reasons of the failed ones
+  boost::asio::steady_timer m_attemptTimer;
+  bool m_isAttemptOverdue = false;
 };
 
 } // namespace Tarvel::System

@@ -204,6 +204,16 @@ TEST(TcpClientSocket, ReportsEachAddressThatFailed) {
                 ": ::1: Connection refused; 127.0.0.1: Connection refused");
 }
 
+TEST(TcpClientSocket, GivesUpAnAddressThatNeverAnswersForTheNext) {
+  const FullPort full;
+  const ScopedNameLookup lookup([](const std::string &) {
+    return AddressList{boost::asio::ip::make_address("127.0.0.1"), boost::asio::ip::make_address("127.0.0.2")};
+  });
+  EXPECT_EQ(Connect("two.example", full.GetPort()),
+            "Cannot connect to two.example:" + std::to_string(full.GetPort()) +
+                ": 127.0.0.1: Connection timed out; 127.0.0.2: Connection refused");
+}
+
 TEST(TcpClientSocket, ClosingEndsAConnectThatNobodyAnswers) {
   const FullPort full;
   const Ref<TcpClientSocket> socket = CreateTcpClientSocket();
