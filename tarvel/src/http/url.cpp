@@ -55,11 +55,12 @@ std::string_view FindAuthority(std::string_view url) {
   return UpToPath(url.substr(colon + START.size()));
 }
 
-/// Where user information stands, or would stand if the scheme were there, with the "@" after it; empty for none.
+/// All that may be user information, with the "@" after it; empty for none. A password may hold what would end it, and the
+/// scheme may be missing, so it is taken to reach to the last "@".
 std::string_view FindUserInformation(std::string_view url) {
-  const std::size_t slashes = url.find("//");
-  const std::string_view authority = UpToPath(slashes == std::string_view::npos ? url : url.substr(slashes + 2));
-  return authority.substr(0, authority.rfind('@') + 1);
+  const std::string_view upToMark = url.substr(0, url.rfind('@') + 1);
+  const std::size_t slashes = upToMark.find("//");
+  return slashes == std::string_view::npos ? upToMark : upToMark.substr(slashes + 2);
 }
 
 /// `url` as a message may show it: without user information, which may hold a password, on one line and not endless.
