@@ -69,6 +69,7 @@ private:
   bool IsGenuine(const KeyInfoResolver &resolver) const;
   Crypto::CertificateList UsableKeys(const KeyInfoResolver &resolver, Crypto::SignatureScheme scheme) const;
   std::vector<const Node *> Targets() const;
+  void RequireEnveloping(const Node &target, const ReferencePlan &plan, const ReferenceSyntax &reference) const;
   bool DigestFits(const Node &target, const ReferencePlan &plan, const ReferenceSyntax &reference) const;
   bool SignatureValueFits(const SignaturePlan &plan, const Crypto::CertificateList &keys) const;
 
@@ -97,11 +98,18 @@ bool ParsedSignature::IsGenuine(const KeyInfoResolver &resolver) const {
   const Crypto::CertificateList keys = UsableKeys(resolver, plan.algorithm.scheme);
   const std::vector<const Node *> targets = Targets();
   for (std::size_t index = 0; index < targets.size(); ++index) {
+    RequireEnveloping(*targets[index], plan.references[index], m_syntax.references[index]);
+  }
+  // Digesting may cost as much as ten times the document's size: only a signer may ask for that.
+  if (!SignatureValueFits(plan, keys)) {
+    return false;
+  }
+  for (std::size_t index = 0; index < targets.size(); ++index) {
     if (!DigestFits(*targets[index], plan.references[index], m_syntax.references[index])) {
       return false;
     }
   }
-  return SignatureValueFits(plan, keys);
+  return true;
 }
 
 Crypto::CertificateList ParsedSignature::UsableKeys(const KeyInfoResolver &resolver,
@@ -128,13 +136,18 @@ std::vector<const Node *> ParsedSignature::Targets() const {
   return ResolveReferences(*m_root, uris);
 }
 
-bool ParsedSignature::DigestFits(const Node &target, const ReferencePlan &plan,
-                                 const ReferenceSyntax &reference) const {
-  const Node *omitted = plan.omitsSignature ? m_element.get() : nullptr;
-  if (omitted && (omitted == &target || !IsWithin(omitted, target))) {
+void ParsedSignature::RequireEnveloping(const Node &target, const ReferencePlan &plan,
+                                        const ReferenceSyntax &reference) const {
+  const Node *const signature = m_element.get();
+  if (plan.omitsSignature && (signature == &target || !IsWithin(signature, target))) {
     throw XmlSecurityException("The reference URI \"" + std::string(reference.uri) +
                                "\" has the enveloped-signature transform, but does not envelop the signature");
   }
+}
+
+bool ParsedSignature::DigestFits(const Node &target, const ReferencePlan &plan,
+                                 const ReferenceSyntax &reference) const {
+  const Node *const omitted = plan.omitsSignature ? m_element.get() : nullptr;
   const DigestValue digest = DigestCanonicalForm(target, plan.method, omitted, plan.digest);
   return reference.digestValue.size() == Crypto::DigestBytes(plan.digest) &&
          CRYPTO_memcmp(reference.digestValue.data(), digest.data(), reference.digestValue.size()) == 0;
