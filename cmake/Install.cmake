@@ -1,6 +1,7 @@
 # SPDX-License-Identifier: Apache-2.0
 # What `cmake --install` puts where: both libraries, their public headers, the CMake package and the pkg-config files.
-# Components: "runtime" (what a program needs to run), "development" (what one needs to build it), "tools".
+# Components: "runtime" (what a program needs to run), "development" (what one needs to build it), "tools"; "gssapi" and
+# "gssapi-development" for the negotiation handler.
 
 include(CMakePackageConfigHelpers)
 
@@ -34,6 +35,26 @@ foreach(name tarvel ssoclient)
   configure_file(cmake/${name}.pc.in ${PROJECT_BINARY_DIR}/${name}.pc @ONLY)
   install(FILES ${PROJECT_BINARY_DIR}/${name}.pc DESTINATION ${CMAKE_INSTALL_LIBDIR}/pkgconfig COMPONENT development)
 endforeach()
+
+# The handler over the GSSAPI is an option and a component of its own, so that who does without needs no Kerberos.
+if(TARGET ssoclient_gssapi)
+  install(TARGETS ssoclient_gssapi EXPORT ssoclient-gssapi-targets
+    RUNTIME COMPONENT gssapi
+    LIBRARY COMPONENT gssapi NAMELINK_COMPONENT gssapi-development
+    ARCHIVE COMPONENT gssapi-development
+    INCLUDES DESTINATION ${CMAKE_INSTALL_INCLUDEDIR})
+  install(DIRECTORY gssapi/include/ DESTINATION ${CMAKE_INSTALL_INCLUDEDIR} COMPONENT gssapi-development
+    FILES_MATCHING PATTERN "*.h")
+  install(EXPORT ssoclient-gssapi-targets NAMESPACE ssoclient::
+    DESTINATION ${ssoclient_package_dir} COMPONENT gssapi-development)
+  set(ssoclient_pc_gssapi_requires "")
+  if(NOT BUILD_SHARED_LIBS)
+    set(ssoclient_pc_gssapi_requires ", krb5-gssapi >= 1.16, krb5")
+  endif()
+  configure_file(cmake/ssoclient-gssapi.pc.in ${PROJECT_BINARY_DIR}/ssoclient-gssapi.pc @ONLY)
+  install(FILES ${PROJECT_BINARY_DIR}/ssoclient-gssapi.pc
+    DESTINATION ${CMAKE_INSTALL_LIBDIR}/pkgconfig COMPONENT gssapi-development)
+endif()
 
 install(FILES docs/man/ssoclient.1 DESTINATION ${CMAKE_INSTALL_MANDIR}/man1 COMPONENT tools)
 install(FILES LICENSE README.md CHANGELOG.md DESTINATION ${CMAKE_INSTALL_DOCDIR} COMPONENT runtime)

@@ -1,6 +1,7 @@
 # SPDX-License-Identifier: Apache-2.0
-# `cpack` in a build with prefix /usr makes three Debian packages: the libraries, what is needed to build against them,
-# and the tool. Needs dpkg-dev.
+# `cpack` in a build with prefix /usr makes Debian packages: the libraries, what is needed to build against them, the
+# tool, and, when it is built, the negotiation handler over the GSSAPI with what is needed to build against that. Needs
+# dpkg-dev.
 
 set(CPACK_GENERATOR DEB)
 set(CPACK_PACKAGE_NAME ssoclient)
@@ -15,11 +16,14 @@ set(CPACK_COMPONENTS_ALL runtime development)
 if(SSOCLIENT_BUILD_TOOLS)
   list(APPEND CPACK_COMPONENTS_ALL tools)
 endif()
+if(TARGET ssoclient_gssapi)
+  list(APPEND CPACK_COMPONENTS_ALL gssapi gssapi-development)
+endif()
 set(CPACK_DEB_COMPONENT_INSTALL ON)
 set(CPACK_DEBIAN_FILE_NAME DEB-DEFAULT)
 set(CPACK_DEBIAN_PACKAGE_SHLIBDEPS ON)
 set(CPACK_DEBIAN_PACKAGE_SHLIBDEPS_PRIVATE_DIRS
-  "${PROJECT_BINARY_DIR}/tarvel;${PROJECT_BINARY_DIR}/src")
+  "${PROJECT_BINARY_DIR}/tarvel;${PROJECT_BINARY_DIR}/src;${PROJECT_BINARY_DIR}/gssapi")
 set(CPACK_DEBIAN_PACKAGE_GENERATE_SHLIBS ON)
 
 set(CPACK_DEBIAN_RUNTIME_PACKAGE_NAME libssoclient${PROJECT_VERSION_MAJOR})
@@ -29,6 +33,14 @@ set(CPACK_DEBIAN_DEVELOPMENT_PACKAGE_NAME libssoclient-dev)
 set(CPACK_DEBIAN_DEVELOPMENT_PACKAGE_SECTION libdevel)
 set(CPACK_DEBIAN_DEVELOPMENT_PACKAGE_DEPENDS
   "libssoclient${PROJECT_VERSION_MAJOR} (= ${PROJECT_VERSION}), libboost1.81-dev | libboost-dev")
+set(CPACK_DEBIAN_GSSAPI_PACKAGE_NAME libssoclient-gssapi${PROJECT_VERSION_MAJOR})
+set(CPACK_DEBIAN_GSSAPI_PACKAGE_SECTION libs)
+set(CPACK_DEBIAN_GSSAPI_PACKAGE_DEPENDS "libssoclient${PROJECT_VERSION_MAJOR} (= ${PROJECT_VERSION})")
+set(CPACK_DEBIAN_GSSAPI_PACKAGE_CONTROL_EXTRA ${PROJECT_SOURCE_DIR}/packaging/triggers)
+set(CPACK_DEBIAN_GSSAPI-DEVELOPMENT_PACKAGE_NAME libssoclient-gssapi-dev)
+set(CPACK_DEBIAN_GSSAPI-DEVELOPMENT_PACKAGE_SECTION libdevel)
+set(CPACK_DEBIAN_GSSAPI-DEVELOPMENT_PACKAGE_DEPENDS
+  "libssoclient-gssapi${PROJECT_VERSION_MAJOR} (= ${PROJECT_VERSION}), libssoclient-dev (= ${PROJECT_VERSION})")
 set(CPACK_DEBIAN_TOOLS_PACKAGE_NAME ssoclient)
 set(CPACK_DEBIAN_TOOLS_PACKAGE_SECTION utils)
 

@@ -1,0 +1,33 @@
+// SPDX-License-Identifier: Apache-2.0
+#include "gss_name.h"
+
+#include "gss_status.h"
+
+#include <tarvel/core/exception.h>
+
+#include <gssapi/gssapi_krb5.h>
+
+namespace SsoClient::Gssapi {
+
+void ImportName(const std::string &text, gss_const_OID form, NameHandle &name) {
+  std::string octets = text;
+  gss_buffer_desc buffer = {octets.size(), octets.data()};
+  // The form is only read; the GSSAPI's declarations know no const.
+  gss_OID_desc writableForm = *form;
+  GssStatus status;
+  status.major = gss_import_name(&status.minor, &buffer, &writableForm, name.Slot());
+  if (status.IsError()) {
+    throw Tarvel::InvalidArgumentException("'" + text + "' is no name: " + DescribeStatus(status, GSS_C_NO_OID));
+  }
+}
+
+void ImportServiceName(const std::string &service, NameHandle &name) {
+  const bool isPrincipal = service.find('/') != std::string::npos;
+  const std::size_t separator = service.find(isPrincipal ? '/' : '@');
+  if (separator == 0 || separator == std::string::npos || separator + 1 == service.size()) {
+    throw Tarvel::InvalidArgumentException("'" + service + "' is no service, as HTTP@host or HTTP/host@REALM");
+  }
+  ImportName(service, isPrincipal ? GSS_KRB5_NT_PRINCIPAL_NAME : GSS_C_NT_HOSTBASED_SERVICE, name);
+}
+
+} // namespace SsoClient::Gssapi

@@ -1,0 +1,45 @@
+// SPDX-License-Identifier: Apache-2.0
+#include "gss_status.h"
+
+#include "gss_handles.h"
+
+namespace SsoClient::Gssapi {
+
+namespace {
+
+/// A status has a text for each of its parts, a handful; a GSSAPI that goes on and on is not listened to for ever.
+constexpr int MAX_TEXTS = 16;
+
+/// The texts of one of the two codes.
+std::string DescribeCode(OM_uint32 code, int kind, gss_OID mechanism) {
+  std::string all;
+  OM_uint32 rest = 0; // what to ask for next; 0 again after the last text
+  for (int i = 0; i < MAX_TEXTS; ++i) {
+    GssOctets octets;
+    OM_uint32 minor = 0;
+    if (GSS_ERROR(gss_display_status(&minor, code, kind, mechanism, &rest, octets.Slot())) != 0) {
+      break;
+    }
+    std::string text(octets.begin(), octets.end());
+    text.erase(text.find_last_not_of('\0') + 1); // some mechanisms count the terminating null
+    all += (all.empty() ? "" : "; ") + text;
+    if (rest == 0) {
+      break;
+    }
+  }
+  return all;
+}
+
+} // namespace
+
+std::string DescribeStatus(const GssStatus &status, gss_OID mechanism) {
+  // The mechanism's words first: what it keeps of them may go with the next failure.
+  const std::string minorText = status.minor == 0 ? "" : DescribeCode(status.minor, GSS_C_MECH_CODE, mechanism);
+  std::string text = DescribeCode(status.major, GSS_C_GSS_CODE, GSS_C_NO_OID);
+  if (!minorText.empty()) {
+    text += ": " + minorText;
+  }
+  return text;
+}
+
+} // namespace SsoClient::Gssapi

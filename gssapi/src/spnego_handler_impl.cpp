@@ -1,0 +1,156 @@
+// SPDX-License-Identifier: Apache-2.0
+#include "spnego_handler_impl.h"
+
+#include "gss_name.h"
+#include "mechanism.h"
+
+#include <ssoclient/gssapi/exceptions.h>
+
+#include <gssapi/gssapi_ext.h>
+
+#include <string>
+#include <utility>
+
+namespace SsoClient::Gssapi {
+
+namespace {
+
+void RequireText(const std::string &text) {
+  if (text.find('\0') != std::string::npos) {
+    throw Tarvel::InvalidArgumentException("A GSS setting contains a null character");
+  }
+}
+
+void ValidateSettings(const SpnegoSettings &settings) {
+  RequireText(settings.service);
+  RequireText(settings.client);
+  RequireText(settings.credentialCache);
+  RequireText(settings.clientKeytab);
+  if (settings.maximumLegs < 1) {
+    throw Tarvel::InvalidArgumentException("The limit on legs must be positive");
+  }
+  if (settings.timeLimitSec < 1) {
+    throw Tarvel::InvalidArgumentException("The time limit must be positive");
+  }
+}
+
+} // namespace
+
+std::shared_ptr<SpnegoHandler> CreateSpnegoHandler(const SpnegoSettings &settings) {
+  return std::make_shared<SpnegoHandlerImpl>(settings);
+}
+
+SpnegoHandlerImpl::SpnegoHandlerImpl(const SpnegoSettings &settings, Clock clock)
+    : m_settings(settings), m_clock(std::move(clock)) {
+  ValidateSettings(m_settings);
+  ImportServiceName(m_settings.service, m_service);
+}
+
+std::shared_ptr<std::vector<std::uint8_t>>
+SpnegoHandlerImpl::NegotiateLeg(const std::vector<std::uint8_t> &serviceLeg) {
+  try {
+    return std::make_shared<std::vector<std::uint8_t>>(MakeLeg(serviceLeg));
+  } catch (...) {
+    m_state = State::FAILED;
+    throw;
+  }
+}
+
+void SpnegoHandlerImpl::RequireMutualAuthentication() const {
+  if (!IsMutuallyAuthenticated()) {
+    throw GssNegotiationException("The service " + m_settings.service +
+                                  " was not authenticated: the negotiation is not complete");
+  }
+}
+
+std::vector<std::uint8_t> SpnegoHandlerImpl::MakeLeg(const std::vector<std::uint8_t> &serviceLeg) {
+  CheckServiceLeg(serviceLeg);
+  if (m_state == State::NEW) {
+    m_start = m_clock();
+  }
+  CountLeg();
+  CheckTime();
+  if (m_state == State::COMPLETE) {
+    return {};
+  }
+  if (m_state == State::NEW) {
+    m_credential = std::make_unique<const ClientCredential>(m_settings);
+  }
+  std::vector<std::uint8_t> leg = AdvanceContext(serviceLeg);
+  CheckTime();
+  return leg;
+}
+
+void SpnegoHandlerImpl::CheckServiceLeg(const std::vector<std::uint8_t> &serviceLeg) const {
+  switch (m_state) {
+  case State::NEW:
+    if (!serviceLeg.empty()) {
+      throw Tarvel::InvalidArgumentException("The first leg is the client's");
+    }
+    return;
+  case State::STARTED:
+    if (serviceLeg.empty()) {
+      throw GssNegotiationException("The service " + m_settings.service +
+                                    " sent no leg, but the negotiation is not complete");
+    }
+    return;
+  case State::COMPLETE:
+    if (!serviceLeg.empty()) {
+      throw GssNegotiationException("The service " + m_settings.service +
+                                    " sent a further leg, but the negotiation is complete");
+    }
+    return;
+  case State::FAILED:
+    throw Tarvel::InvalidStateException("The negotiation with " + m_settings.service + " has failed before");
+  }
+}
+
+std::vector<std::uint8_t> SpnegoHandlerImpl::AdvanceContext(const std::vector<std::uint8_t> &serviceLeg) {
+  std::vector<std::uint8_t> input = serviceLeg; // the GSSAPI's declarations know no const
+  gss_buffer_desc inputBuffer = {input.size(), input.data()};
+  const OM_uint32 wanted =
+      GSS_C_MUTUAL_FLAG | GSS_C_INTEG_FLAG | (m_settings.dceStyle ? OM_uint32{GSS_C_DCE_STYLE} : 0);
+  GssOctets leg;
+  OM_uint32 flags = 0;
+  GssStatus status;
+  status.major =
+      gss_init_sec_context(&status.minor, m_credential->Get(), m_context.Slot(), m_service.Get(), SpnegoMechanism(),
+                           wanted, GSS_C_INDEFINITE, GSS_C_NO_CHANNEL_BINDINGS,
+                           input.empty() ? GSS_C_NO_BUFFER : &inputBuffer, nullptr, leg.Slot(), &flags, nullptr);
+  if (status.IsError()) {
+    // What the GSSAPI wants the service to know of it cannot be sent: the operation ends here.
+    throw GssNegotiationException("The negotiation with " + m_settings.service +
+                                  " failed: " + DescribeStatus(status, SpnegoMechanism()));
+  }
+  if ((status.major & GSS_S_CONTINUE_NEEDED) == 0) {
+    CompleteWith(flags);
+  } else {
+    m_state = State::STARTED;
+  }
+  return {leg.begin(), leg.end()};
+}
+
+void SpnegoHandlerImpl::CompleteWith(OM_uint32 contextFlags) {
+  if ((contextFlags & GSS_C_MUTUAL_FLAG) == 0) {
+    throw GssNegotiationException("The service " + m_settings.service +
+                                  " was not authenticated: the mechanism did without");
+  }
+  m_state = State::COMPLETE;
+}
+
+void SpnegoHandlerImpl::CountLeg() {
+  if (m_legs == m_settings.maximumLegs) {
+    throw GssLimitException("The negotiation with " + m_settings.service + " did not end within " +
+                            std::to_string(m_settings.maximumLegs) + " legs");
+  }
+  ++m_legs;
+}
+
+void SpnegoHandlerImpl::CheckTime() {
+  if (m_clock() - m_start > std::chrono::seconds(m_settings.timeLimitSec)) {
+    throw GssLimitException("The negotiation with " + m_settings.service + " did not end within " +
+                            std::to_string(m_settings.timeLimitSec) + " seconds");
+  }
+}
+
+} // namespace SsoClient::Gssapi

@@ -1,0 +1,58 @@
+// SPDX-License-Identifier: Apache-2.0
+/// @file
+/// `SpnegoHandlerImpl`, the one implementation of `SpnegoHandler`.
+
+#pragma once
+
+#include "client_credential.h"
+#include "gss_handles.h"
+#include "gss_status.h"
+
+#include <ssoclient/gssapi/spnego_handler.h>
+
+#include <chrono>
+#include <cstdint>
+#include <functional>
+#include <memory>
+#include <optional>
+#include <vector>
+
+namespace SsoClient::Gssapi {
+
+class SpnegoHandlerImpl final : public SpnegoHandler {
+public:
+  using Clock = std::function<std::chrono::steady_clock::time_point()>;
+
+  /// @throws Tarvel::InvalidArgumentException as `CreateSpnegoHandler`.
+  explicit SpnegoHandlerImpl(const SpnegoSettings &settings, Clock clock = std::chrono::steady_clock::now);
+
+  std::shared_ptr<std::vector<std::uint8_t>> NegotiateLeg(const std::vector<std::uint8_t> &serviceLeg) override;
+  bool IsMutuallyAuthenticated() const noexcept override { return m_state == State::COMPLETE; }
+  void RequireMutualAuthentication() const override;
+
+private:
+  enum class State {
+    NEW,      ///< no leg has been made
+    STARTED,  ///< the client waits for the service's leg
+    COMPLETE, ///< both sides know each other
+    FAILED    ///< for good
+  };
+
+  std::vector<std::uint8_t> MakeLeg(const std::vector<std::uint8_t> &serviceLeg);
+  void CheckServiceLeg(const std::vector<std::uint8_t> &serviceLeg) const;
+  std::vector<std::uint8_t> AdvanceContext(const std::vector<std::uint8_t> &serviceLeg);
+  void CompleteWith(OM_uint32 contextFlags);
+  void CountLeg();
+  void CheckTime();
+
+  const SpnegoSettings m_settings;
+  const Clock m_clock;
+  NameHandle m_service;
+  State m_state = State::NEW;
+  int m_legs = 0;
+  std::chrono::steady_clock::time_point m_start;        // of the first leg
+  std::unique_ptr<const ClientCredential> m_credential; // null until the first leg
+  ContextHandle m_context;
+};
+
+} // namespace SsoClient::Gssapi
