@@ -1,0 +1,70 @@
+// SPDX-License-Identifier: Apache-2.0
+/// @file
+/// The development token service as a process of its own, for as long as a test needs it.
+
+#pragma once
+
+#include <string>
+#include <string_view>
+#include <vector>
+
+#include <sys/types.h>
+
+namespace Testing {
+
+/// How a process has ended.
+struct ProcessEnd {
+  int exitCode = -1; ///< 128 plus the signal when one ended it
+  std::string out;   ///< what came behind the ready line
+};
+
+/// A running service. A test program that has one names it in CMake: ssoclient_needs_devsts(TARGET).
+class DevSts {
+public:
+  /// Starts the service on a free port and waits until it is ready. The keys are made by the first start in a build and
+  /// used by all others. `arguments` come behind --state, --port 0 and --until-eof, and so may name another --state.
+  /// @throws std::runtime_error with the service's own words when it does not get ready within a minute
+  explicit DevSts(const std::vector<std::string> &arguments = {});
+  DevSts(const DevSts &) = delete;
+  DevSts &operator=(const DevSts &) = delete;
+  /// Ends the service, by force if need be. Should the test die before, the service sees its standard input end.
+  ~DevSts();
+
+  const std::string &GetUrl() const noexcept { return m_url; }
+  /// The address under which this one fault is met.
+  std::string FaultUrl(std::string_view fault) const { return m_url + "/fault/" + std::string(fault); }
+  int GetPort() const noexcept { return m_port; }
+  pid_t GetProcess() const noexcept { return m_process; }
+  const std::string &GetThumbprint() const noexcept { return m_thumbprint; }
+  const std::string &GetReadyLine() const noexcept { return m_readyLine; }
+
+  /// The path of a file of the state folder, as "authority.crt", "signing.crt", "client.key", "other-client.crt".
+  std::string PathOf(std::string_view file) const { return m_folder + "/" + std::string(file); }
+  /// The content of such a file.
+  std::string ReadStateFile(std::string_view file) const;
+
+  /// What the service has written to standard error so far.
+  std::string GetLog() const;
+
+  /// Sends the signal, or with 0 ends standard input, and waits for the end of the process.
+  ProcessEnd End(int signal = 0);
+
+private:
+  void Start(const std::vector<std::string> &arguments);
+  void ReadReadyLine();
+  bool AwaitEnd(int milliseconds, int &status) noexcept;
+  void Close() noexcept;
+
+  std::string m_url;
+  std::string m_folder;
+  std::string m_thumbprint;
+  std::string m_readyLine;
+  std::string m_rest;
+  int m_port = 0;
+  pid_t m_process = -1; // -1 once it has ended
+  int m_in = -1;
+  int m_out = -1;
+  int m_log = -1;
+};
+
+} // namespace Testing

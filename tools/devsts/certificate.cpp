@@ -1,0 +1,131 @@
+// SPDX-License-Identifier: Apache-2.0
+#include "certificate.h"
+
+#include <openssl/err.h>
+#include <openssl/x509_vfy.h>
+#include <openssl/x509v3.h>
+
+#include <algorithm>
+#include <array>
+#include <new>
+#include <vector>
+
+namespace DevSts {
+
+namespace {
+
+constexpr int MINIMUM_BITS = 2048;
+
+struct StoreDeleter {
+  void operator()(X509_STORE *store) const noexcept { X509_STORE_free(store); }
+};
+struct StoreContextDeleter {
+  void operator()(X509_STORE_CTX *context) const noexcept { X509_STORE_CTX_free(context); }
+};
+
+std::vector<unsigned char> DerOf(const X509 &certificate) {
+  unsigned char *der = nullptr;
+  const int length = i2d_X509(&certificate, &der);
+  if (length < 0) {
+    throw std::bad_alloc();
+  }
+  const std::vector<unsigned char> copy(der, der + length);
+  OPENSSL_free(der);
+  return copy;
+}
+
+std::vector<unsigned char> DecodeBase64(std::string_view text) {
+  std::string packed;
+  std::copy_if(text.begin(), text.end(), std::back_inserter(packed),
+               [](char c) { return c != ' ' && c != '\t' && c != '\r' && c != '\n'; });
+  std::vector<unsigned char> bytes(packed.size() / 4 * 3);
+  if (packed.empty() || packed.size() % 4 != 0 || packed.size() > 65536 ||
+      EVP_DecodeBlock(bytes.data(), reinterpret_cast<const unsigned char *>(packed.data()),
+                      static_cast<int>(packed.size())) < 0) {
+    return {};
+  }
+  // The decoder counts the padding as octets.
+  const std::size_t padding = packed.size() - (packed.find_last_not_of('=') + 1);
+  bytes.resize(bytes.size() - std::min<std::size_t>(padding, 2));
+  return bytes;
+}
+
+/// The only entry of that kind in the name; empty for none or several.
+std::string OnlyEntry(const X509_NAME *name, int kind) {
+  const int at = X509_NAME_get_index_by_NID(name, kind, -1);
+  if (at < 0 || X509_NAME_get_index_by_NID(name, kind, at) >= 0) {
+    return {};
+  }
+  unsigned char *text = nullptr;
+  const int length = ASN1_STRING_to_UTF8(&text, X509_NAME_ENTRY_get_data(X509_NAME_get_entry(name, at)));
+  const std::string copy(reinterpret_cast<const char *>(text), length > 0 ? static_cast<std::size_t>(length) : 0);
+  OPENSSL_free(text);
+  return copy;
+}
+
+} // namespace
+
+Certificate DecodeCertificate(std::string_view base64) {
+  const std::vector<unsigned char> der = DecodeBase64(base64);
+  const unsigned char *next = der.data();
+  Certificate certificate(der.empty() ? nullptr : d2i_X509(nullptr, &next, static_cast<long>(der.size())));
+  ERR_clear_error();
+  return certificate && next == der.data() + der.size() ? std::move(certificate) : nullptr;
+}
+
+std::string EncodeCertificate(const X509 &certificate) {
+  const std::vector<unsigned char> der = DerOf(certificate);
+  std::string text((der.size() + 2) / 3 * 4 + 1, '\0'); // the encoder ends with a zero
+  const int length =
+      EVP_EncodeBlock(reinterpret_cast<unsigned char *>(text.data()), der.data(), static_cast<int>(der.size()));
+  text.resize(static_cast<std::size_t>(length));
+  return text;
+}
+
+std::string ThumbprintOf(const X509 &certificate) {
+  std::array<unsigned char, EVP_MAX_MD_SIZE> digest{};
+  unsigned length = 0;
+  X509_digest(&certificate, EVP_sha256(), digest.data(), &length);
+  constexpr std::string_view DIGITS = "0123456789abcdef";
+  std::string text;
+  for (unsigned i = 0; i < length; ++i) {
+    text += DIGITS[digest[i] >> 4u];
+    text += DIGITS[digest[i] & 15u];
+  }
+  return text;
+}
+
+bool HasStrongKey(const X509 &certificate) {
+  const EVP_PKEY *const key = X509_get0_pubkey(&certificate);
+  return key && EVP_PKEY_get_base_id(key) == EVP_PKEY_RSA && EVP_PKEY_get_bits(key) >= MINIMUM_BITS;
+}
+
+bool IsClientOf(X509 &certificate, X509 &authority) {
+  const std::unique_ptr<X509_STORE, StoreDeleter> store(X509_STORE_new());
+  const std::unique_ptr<X509_STORE_CTX, StoreContextDeleter> context(X509_STORE_CTX_new());
+  const bool trusted = store && context && X509_STORE_add_cert(store.get(), &authority) == 1 &&
+                       X509_STORE_CTX_init(context.get(), store.get(), &certificate, nullptr) == 1 &&
+                       X509_STORE_CTX_set_purpose(context.get(), X509_PURPOSE_SSL_CLIENT) == 1 &&
+                       X509_verify_cert(context.get()) == 1;
+  ERR_clear_error();
+  return trusted;
+}
+
+std::string PrincipalOf(const X509 &certificate) {
+  const X509_NAME *const subject = X509_get_subject_name(&certificate);
+  const std::string name = OnlyEntry(subject, NID_commonName);
+  const std::string domain = OnlyEntry(subject, NID_organizationName);
+  return name.empty() || domain.empty() ? std::string() : name + "@" + domain;
+}
+
+std::string OpenSslErrors() {
+  std::string text;
+  while (const unsigned long error = ERR_get_error()) {
+    std::array<char, 256> line{};
+    ERR_error_string_n(error, line.data(), line.size());
+    text += (text.empty() ? "" : "; ") + std::string(line.data());
+  }
+  return text;
+}
+
+} // namespace DevSts

@@ -1,0 +1,186 @@
+// SPDX-License-Identifier: Apache-2.0
+#include "connection.h"
+
+#include <boost/asio/buffer.hpp>
+#include <boost/asio/write.hpp>
+#include <boost/beast/http/error.hpp>
+#include <boost/beast/http/read.hpp>
+
+#include <chrono>
+#include <sstream>
+
+namespace DevSts {
+
+namespace {
+
+namespace asio = boost::asio;
+namespace beast = boost::beast;
+namespace http = boost::beast::http;
+
+constexpr std::chrono::seconds HANDSHAKE_LIMIT(30);
+constexpr std::chrono::seconds REQUEST_LIMIT(60); // an idle connection is closed after it as well
+constexpr std::chrono::seconds WRITE_LIMIT(60);
+constexpr std::chrono::seconds CLOSE_LIMIT(5);
+constexpr std::uint32_t HEADER_BYTES = 16 * 1024;
+constexpr std::uint64_t BODY_BYTES = 1024 * 1024;
+
+std::string Describe(const asio::ip::tcp::socket &socket) {
+  beast::error_code error;
+  const asio::ip::tcp::endpoint peer = socket.remote_endpoint(error);
+  std::ostringstream text;
+  text << peer;
+  return text.str();
+}
+
+std::string Field(const http::request<http::string_body> &message, std::string_view name) {
+  return std::string(message[boost::string_view(name.data(), name.size())]);
+}
+
+} // namespace
+
+Connection::Connection(asio::ip::tcp::socket socket, asio::ssl::context &tls, const RequestHandler &handler,
+                       std::atomic<int> &count)
+    : m_stream(std::move(socket), tls), m_timer(m_stream.get_executor()), m_handler(handler), m_count(count),
+      m_peer(Describe(m_stream.next_layer().socket())) {
+  ++m_count;
+  beast::error_code ignored;
+  m_stream.next_layer().socket().set_option(asio::ip::tcp::no_delay(true), ignored);
+}
+
+Connection::~Connection() {
+  --m_count;
+}
+
+void Connection::Start() {
+  m_stream.next_layer().expires_after(HANDSHAKE_LIMIT);
+  m_stream.async_handshake(asio::ssl::stream_base::server, [self = shared_from_this()](const ErrorCode &error) {
+    if (error) {
+      LogLine(self->m_peer + ": handshake failed: " + error.message());
+      return;
+    }
+    self->Read();
+  });
+}
+
+void Connection::Read() {
+  m_parser.emplace();
+  m_parser->header_limit(HEADER_BYTES);
+  m_parser->body_limit(BODY_BYTES);
+  m_stream.next_layer().expires_after(REQUEST_LIMIT);
+  http::async_read(m_stream, m_buffer, *m_parser,
+                   [self = shared_from_this()](const ErrorCode &error, std::size_t) { self->OnRead(error); });
+}
+
+void Connection::OnRead(const ErrorCode &error) {
+  if (error == http::error::end_of_stream) {
+    Close();
+    return;
+  }
+  if (error) {
+    RefuseUnreadable(error);
+    return;
+  }
+  Begin(m_handler.Handle(TakeRequest()));
+}
+
+/// A request that breaks HTTP or a limit gets an answer; a connection that breaks gets none.
+void Connection::RefuseUnreadable(const ErrorCode &error) {
+  if (error.category() != http::make_error_code(http::error::bad_value).category() ||
+      error == http::error::partial_message) {
+    return;
+  }
+  LogLine(m_peer + ": refused: " + error.message());
+  const int status = error == http::error::body_limit ? 413 : error == http::error::header_limit ? 431 : 400;
+  Begin(Deliver({status, "text/plain", error.message() + "\n"}, Fault(), false));
+}
+
+HttpRequest Connection::TakeRequest() {
+  http::request<http::string_body> message = m_parser->release();
+  HttpRequest request;
+  request.peer = m_peer;
+  request.method = std::string(message.method_string());
+  request.target = std::string(message.target());
+  request.contentType = Field(message, "Content-Type");
+  request.soapAction = Field(message, "SOAPAction");
+  request.keepOpen = message.keep_alive();
+  request.body = std::move(message.body());
+  return request;
+}
+
+void Connection::Begin(Delivery delivery) {
+  m_delivery = std::move(delivery);
+  m_step = 0;
+  NextStep();
+}
+
+void Connection::NextStep() {
+  if (m_step == m_delivery.steps.size()) {
+    Finish();
+    return;
+  }
+  const std::chrono::milliseconds delay = m_delivery.steps[m_step].delay;
+  if (delay.count() == 0) {
+    WriteStep();
+    return;
+  }
+  m_timer.expires_after(delay);
+  m_timer.async_wait([self = shared_from_this()](const ErrorCode &error) {
+    if (!error) {
+      self->WriteStep();
+    }
+  });
+}
+
+void Connection::WriteStep() {
+  m_stream.next_layer().expires_after(WRITE_LIMIT);
+  asio::async_write(m_stream, asio::buffer(m_delivery.steps[m_step].bytes),
+                    [self = shared_from_this()](const ErrorCode &error, std::size_t) {
+                      if (error) {
+                        return;
+                      }
+                      ++self->m_step;
+                      self->NextStep();
+                    });
+}
+
+void Connection::Finish() {
+  switch (m_delivery.end) {
+  case DeliveryEnd::KEEP_OPEN:
+    Read();
+    return;
+  case DeliveryEnd::CLOSE:
+    Close();
+    return;
+  case DeliveryEnd::RESET:
+    Reset();
+    return;
+  case DeliveryEnd::STALL:
+    AwaitPeer();
+    return;
+  }
+}
+
+void Connection::Close() {
+  m_stream.next_layer().expires_after(CLOSE_LIMIT);
+  m_stream.async_shutdown([self = shared_from_this()](const ErrorCode &) {});
+}
+
+void Connection::Reset() {
+  ErrorCode ignored;
+  asio::ip::tcp::socket &socket = m_stream.next_layer().socket();
+  socket.set_option(asio::socket_base::linger(true, 0), ignored); // closing now sends a reset
+  socket.close(ignored);
+}
+
+/// Never answers; ends when the client gives up.
+void Connection::AwaitPeer() {
+  m_stream.next_layer().expires_never();
+  m_buffer.clear();
+  m_stream.async_read_some(m_buffer.prepare(4096), [self = shared_from_this()](const ErrorCode &error, std::size_t) {
+    if (!error) {
+      self->AwaitPeer();
+    }
+  });
+}
+
+} // namespace DevSts

@@ -1,0 +1,283 @@
+// SPDX-License-Identifier: Apache-2.0
+#include "faults.h"
+
+#include <charconv>
+#include <chrono>
+
+namespace DevSts {
+
+namespace {
+
+constexpr int DRIP_SECONDS = 2;
+constexpr int BAD_STATUS = 503;
+constexpr int LONGEST_DELAY = 3600;
+
+struct NamedFault {
+  std::string_view name;
+  Fault fault;
+};
+
+constexpr Fault OfToken(TokenFault token) {
+  Fault fault;
+  fault.token = token;
+  return fault;
+}
+
+constexpr Fault OfDocument(DocumentFault document) {
+  Fault fault;
+  fault.document = document;
+  return fault;
+}
+
+constexpr Fault OfDelivery(DeliveryFault delivery, int number = 0) {
+  Fault fault;
+  fault.delivery = delivery;
+  fault.number = number;
+  return fault;
+}
+
+constexpr NamedFault NAMED[] = {
+    {"stall", OfDelivery(DeliveryFault::STALL)},
+    {"drip", OfDelivery(DeliveryFault::DRIP, DRIP_SECONDS)},
+    {"reset", OfDelivery(DeliveryFault::RESET)},
+    {"reset-in-header", OfDelivery(DeliveryFault::RESET_IN_HEADER)},
+    {"reset-in-body", OfDelivery(DeliveryFault::RESET_IN_BODY)},
+    {"truncate", OfDelivery(DeliveryFault::TRUNCATE)},
+    {"oversize", OfDelivery(DeliveryFault::OVERSIZE)},
+    {"bad-status", OfDelivery(DeliveryFault::BAD_STATUS, BAD_STATUS)},
+    {"bad-content-length", OfDelivery(DeliveryFault::BAD_CONTENT_LENGTH)},
+    {"garbage", OfDelivery(DeliveryFault::GARBAGE)},
+    {"garbled-xml", OfDocument(DocumentFault::GARBLED_XML)},
+    {"not-soap", OfDocument(DocumentFault::NOT_SOAP)},
+    {"empty-body", OfDocument(DocumentFault::EMPTY_BODY)},
+    {"no-token", OfDocument(DocumentFault::NO_TOKEN)},
+    {"wrong-root", OfDocument(DocumentFault::WRONG_ROOT)},
+    {"wrong-element", OfDocument(DocumentFault::WRONG_ELEMENT)},
+    {"wrong-wrapper", OfDocument(DocumentFault::WRONG_WRAPPER)},
+    {"wrong-status", OfDocument(DocumentFault::WRONG_STATUS)},
+    {"expired-token", OfToken(TokenFault::EXPIRED)},
+    {"early-token", OfToken(TokenFault::EARLY)},
+    {"tampered-token", OfToken(TokenFault::TAMPERED)},
+    {"wrong-signer", OfToken(TokenFault::WRONG_SIGNER)},
+    {"unsigned-token", OfToken(TokenFault::UNSIGNED)},
+    {"wrong-audience", OfToken(TokenFault::WRONG_AUDIENCE)},
+    {"bearer-for-hok", OfToken(TokenFault::BEARER)},
+    {"soap-fault-without-code", OfDocument(DocumentFault::SOAP_FAULT_WITHOUT_CODE)},
+};
+
+struct NumberedFault {
+  std::string_view prefix;
+  DeliveryFault delivery;
+  int least;
+  int most;
+};
+
+constexpr NumberedFault NUMBERED[] = {
+    {"stall-then-answer-", DeliveryFault::DELAY, 0, LONGEST_DELAY},
+    {"drip-", DeliveryFault::DRIP, 1, LONGEST_DELAY},
+    {"bad-status-", DeliveryFault::BAD_STATUS, 200, 599},
+};
+
+constexpr std::string_view SOAP_FAULT_PREFIX = "soap-fault-";
+
+struct NamedCode {
+  std::string_view name;
+  FaultCode code;
+};
+
+constexpr NamedCode CODES[] = {
+    {"FailedAuthentication", Code::FAILED_AUTHENTICATION},
+    {"InvalidSecurityToken", Code::INVALID_TARGET},
+    {"wsse-InvalidSecurityToken", Code::INVALID_TOKEN},
+    {"wsse-FailedAuthentication", {Ns::WSSE, "FailedAuthentication"}},
+    {"InvalidRequest", Code::INVALID_REQUEST},
+    {"RequestFailed", Code::REQUEST_FAILED},
+    {"InvalidTimeRange", Code::INVALID_TIME_RANGE},
+    {"UnableToRenew", Code::UNABLE_TO_RENEW},
+    {"InvalidSecurity", Code::INVALID_SECURITY},
+    {"FailedCheck", Code::FAILED_CHECK},
+    {"MessageExpired", Code::MESSAGE_EXPIRED},
+    {"Unknown", {{"devsts", "urn:corp.example:devsts"}, "Unknown"}},
+};
+
+std::optional<int> NumberIn(std::string_view text, int least, int most) {
+  int number = 0;
+  const auto [end, error] = std::from_chars(text.data(), text.data() + text.size(), number);
+  if (error != std::errc() || end != text.data() + text.size() || number < least || number > most) {
+    return std::nullopt;
+  }
+  return number;
+}
+
+std::optional<Fault> ParseNumberedFault(std::string_view name) {
+  for (const NumberedFault &known : NUMBERED) {
+    if (name.substr(0, known.prefix.size()) != known.prefix) {
+      continue;
+    }
+    if (const auto number = NumberIn(name.substr(known.prefix.size()), known.least, known.most)) {
+      return OfDelivery(known.delivery, *number);
+    }
+  }
+  return std::nullopt;
+}
+
+/// The first element of that local name at or below `root`.
+xmlNode *FindBelow(xmlNode *root, const char *name) {
+  if (!root || xmlStrEqual(root->name, XmlText(name))) {
+    return root;
+  }
+  for (xmlNode *child : ChildElements(*root)) {
+    if (xmlStrEqual(child->name, XmlText("Assertion"))) {
+      continue; // what is to be spoilt stands around the token, not in it
+    }
+    if (xmlNode *found = FindBelow(child, name)) {
+      return found;
+    }
+  }
+  return nullptr;
+}
+
+void Rename(xmlNode *element, const char *name) {
+  if (element) {
+    xmlNodeSetName(element, XmlText(name));
+  }
+}
+
+void Empty(xmlNode *element) {
+  if (element) {
+    xmlNodeSetContent(element, nullptr);
+  }
+}
+
+/// A response in a collection loses it, any other gets one.
+void SwapWrapper(xmlNode &body) {
+  xmlNode &content = *ChildElements(body).front();
+  if (IsElement(content, Ns::WST, "RequestSecurityTokenResponseCollection")) {
+    xmlNode *const response = ChildElements(content).front();
+    xmlUnlinkNode(response);
+    xmlReplaceNode(&content, response);
+    xmlReconciliateNs(body.doc, response);
+    xmlFreeNode(&content);
+    return;
+  }
+  xmlUnlinkNode(&content);
+  xmlNode &collection = AddElement(body, Ns::WST, "RequestSecurityTokenResponseCollection");
+  xmlAddChild(&collection, &content);
+}
+
+/// What stands in the body becomes the document.
+void RemoveEnvelope(xmlDoc &response, xmlNode &body) {
+  xmlNode *const content = ChildElements(body).front();
+  xmlUnlinkNode(content);
+  xmlNode *const envelope = xmlDocSetRootElement(&response, content);
+  xmlReconciliateNs(&response, content);
+  xmlFreeNode(envelope);
+}
+
+} // namespace
+
+std::optional<Fault> ParseFault(std::string_view name) {
+  for (const NamedFault &known : NAMED) {
+    if (known.name == name) {
+      return known.fault;
+    }
+  }
+  if (name.substr(0, SOAP_FAULT_PREFIX.size()) == SOAP_FAULT_PREFIX) {
+    for (const NamedCode &known : CODES) {
+      if (known.name == name.substr(SOAP_FAULT_PREFIX.size())) {
+        Fault fault = OfDocument(DocumentFault::SOAP_FAULT);
+        fault.code = known.code;
+        return fault;
+      }
+    }
+  }
+  return ParseNumberedFault(name);
+}
+
+std::string FaultHelp() {
+  std::string help;
+  std::string line = " ";
+  const auto add = [&](const std::string &name) {
+    if (line.size() + name.size() > 78) {
+      help += line + "\n";
+      line = " ";
+    }
+    line += " " + name;
+  };
+  for (const NamedFault &known : NAMED) {
+    add(std::string(known.name));
+  }
+  for (const NumberedFault &known : NUMBERED) {
+    add(std::string(known.prefix) + (known.delivery == DeliveryFault::BAD_STATUS ? "NNN" : "SECONDS"));
+  }
+  for (const NamedCode &known : CODES) {
+    add(std::string(SOAP_FAULT_PREFIX) + std::string(known.name));
+  }
+  return help + line + "\n";
+}
+
+void SpoilFacts(TokenFacts &facts, TokenFault fault) {
+  const auto life = facts.notOnOrAfter - facts.notBefore;
+  constexpr std::chrono::hours DAY(24);
+  switch (fault) {
+  case TokenFault::EXPIRED:
+    facts.notOnOrAfter = facts.notBefore - DAY;
+    facts.notBefore = facts.notOnOrAfter - life;
+    return;
+  case TokenFault::EARLY:
+    facts.notBefore += DAY;
+    facts.notOnOrAfter += DAY;
+    return;
+  case TokenFault::WRONG_AUDIENCE:
+    facts.audience = {"https://elsewhere.example/"};
+    return;
+  case TokenFault::BEARER:
+    facts.certificate.clear();
+    return;
+  default:
+    return;
+  }
+}
+
+void TamperWith(xmlDoc &token) {
+  xmlNode &subject = RequireChild(*xmlDocGetRootElement(&token), Ns::SAML, "Subject");
+  SetText(RequireChild(subject, Ns::SAML, "NameID"), "mallory@corp.example");
+}
+
+std::string SpoilResponse(xmlDoc &response, DocumentFault fault) {
+  xmlNode *const root = xmlDocGetRootElement(&response);
+  switch (fault) {
+  case DocumentFault::NO_TOKEN:
+    Empty(FindBelow(root, "RequestedSecurityToken"));
+    Empty(FindBelow(root, "Status"));
+    break;
+  case DocumentFault::WRONG_ELEMENT:
+    Rename(FindBelow(root, "RequestedSecurityToken"), "RequestedProofToken");
+    Rename(FindBelow(root, "Status"), "State");
+    break;
+  case DocumentFault::WRONG_ROOT:
+    RemoveEnvelope(response, RequireChild(*root, Ns::SOAPENV, "Body"));
+    break;
+  case DocumentFault::WRONG_WRAPPER:
+    SwapWrapper(RequireChild(*root, Ns::SOAPENV, "Body"));
+    break;
+  case DocumentFault::WRONG_STATUS:
+    if (xmlNode *code = FindBelow(root, "Code")) {
+      SetText(*code, std::string(Ns::WST.uri) + "/status/unknown");
+    }
+    break;
+  case DocumentFault::GARBLED_XML: {
+    const std::string text = Serialise(response);
+    return text.substr(0, text.size() / 2) + "</garbled>";
+  }
+  case DocumentFault::NOT_SOAP:
+    return "<html><head><title>Welcome</title></head><body>It works!</body></html>";
+  case DocumentFault::EMPTY_BODY:
+    return {};
+  default:
+    break;
+  }
+  return Serialise(response);
+}
+
+} // namespace DevSts

@@ -1,0 +1,75 @@
+// SPDX-License-Identifier: Apache-2.0
+/// @file
+/// The ways in which the service misbehaves when it is asked to.
+
+#pragma once
+
+#include "refusal.h"
+#include "token_facts.h"
+#include "xml_tree.h"
+
+#include <optional>
+#include <string>
+#include <string_view>
+
+namespace DevSts {
+
+/// What is wrong with the token.
+enum class TokenFault { NONE, EXPIRED, EARLY, TAMPERED, WRONG_SIGNER, UNSIGNED, WRONG_AUDIENCE, BEARER };
+
+/// What is wrong with the document that is answered.
+enum class DocumentFault {
+  NONE,
+  NO_TOKEN,
+  WRONG_ROOT,
+  WRONG_ELEMENT,
+  WRONG_WRAPPER,
+  WRONG_STATUS,
+  GARBLED_XML,
+  NOT_SOAP,
+  EMPTY_BODY,
+  SOAP_FAULT,
+  SOAP_FAULT_WITHOUT_CODE,
+};
+
+/// What is wrong on the wire.
+enum class DeliveryFault {
+  NONE,
+  STALL,
+  DELAY,
+  DRIP,
+  RESET,
+  RESET_IN_HEADER,
+  RESET_IN_BODY,
+  TRUNCATE,
+  OVERSIZE,
+  BAD_STATUS,
+  BAD_CONTENT_LENGTH,
+  GARBAGE,
+};
+
+/// One of them at most is not NONE.
+struct Fault {
+  TokenFault token = TokenFault::NONE;
+  DocumentFault document = DocumentFault::NONE;
+  DeliveryFault delivery = DeliveryFault::NONE;
+  int number = 0;         ///< seconds of DELAY and DRIP, status of BAD_STATUS
+  FaultCode code{{}, ""}; ///< of SOAP_FAULT
+};
+
+/// Nothing for a name that is none.
+std::optional<Fault> ParseFault(std::string_view name);
+
+/// All names, for the help text: wrapped lines, each indented.
+std::string FaultHelp();
+
+/// Makes the facts wrong as the fault wants it, before the token is built.
+void SpoilFacts(TokenFacts &facts, TokenFault fault);
+
+/// Changes the subject of a token that is signed already.
+void TamperWith(xmlDoc &token);
+
+/// The text of a response once the fault has been at it.
+std::string SpoilResponse(xmlDoc &response, DocumentFault fault);
+
+} // namespace DevSts

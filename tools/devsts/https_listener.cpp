@@ -1,0 +1,114 @@
+// SPDX-License-Identifier: Apache-2.0
+#include "https_listener.h"
+
+#include "connection.h"
+
+#include <boost/asio/ip/v6_only.hpp>
+#include <boost/asio/strand.hpp>
+#include <boost/system/system_error.hpp>
+
+#include <algorithm>
+#include <chrono>
+#include <memory>
+
+namespace DevSts {
+
+namespace {
+
+namespace asio = boost::asio;
+using asio::ip::tcp;
+using ErrorCode = boost::system::error_code;
+
+constexpr int MOST_CONNECTIONS = 8192;
+constexpr int PORT_TRIES = 20;
+constexpr unsigned LEAST_THREADS = 4;
+constexpr std::chrono::milliseconds PAUSE_WITHOUT_DESCRIPTORS(100);
+
+tcp::acceptor OpenAcceptor(asio::io_context &context, const asio::ip::address &address, std::uint16_t port) {
+  tcp::acceptor acceptor(context);
+  const tcp::endpoint endpoint(address, port);
+  acceptor.open(endpoint.protocol());
+  acceptor.set_option(tcp::acceptor::reuse_address(true));
+  if (address.is_v6()) {
+    acceptor.set_option(asio::ip::v6_only(true));
+  }
+  acceptor.bind(endpoint);
+  acceptor.listen();
+  return acceptor;
+}
+
+bool IsPortTaken(const boost::system::system_error &failure) {
+  return failure.code() == boost::system::errc::address_in_use;
+}
+
+bool LacksIpV6(const boost::system::system_error &failure) {
+  return failure.code() == boost::system::errc::address_family_not_supported ||
+         failure.code() == boost::system::errc::address_not_available;
+}
+
+void SetUpTls(asio::ssl::context &tls, const Identity &identity) {
+  tls.use_certificate_chain_file(identity.certificateFile.string());
+  tls.use_private_key_file(identity.keyFile.string(), asio::ssl::context::pem);
+  SSL_CTX_set_min_proto_version(tls.native_handle(), TLS1_2_VERSION);
+}
+
+} // namespace
+
+HttpsListener::HttpsListener(const Identity &identity, std::uint16_t port, const RequestHandler &handler)
+    : m_tls(asio::ssl::context::tls_server), m_handler(handler) {
+  SetUpTls(m_tls, identity);
+  Listen(port);
+}
+
+HttpsListener::~HttpsListener() {
+  m_context.stop();
+  for (std::thread &thread : m_threads) {
+    thread.join();
+  }
+}
+
+void HttpsListener::Listen(std::uint16_t port) {
+  // A port that is free on one address may be taken on the other; when any will do, another is tried.
+  for (int left = port == 0 ? PORT_TRIES : 1;; --left) {
+    m_acceptors.clear();
+    m_acceptors.push_back(OpenAcceptor(m_context, asio::ip::address_v4::loopback(), port));
+    m_port = m_acceptors.front().local_endpoint().port();
+    try {
+      m_acceptors.push_back(OpenAcceptor(m_context, asio::ip::address_v6::loopback(), m_port));
+      return;
+    } catch (const boost::system::system_error &failure) {
+      if (LacksIpV6(failure)) {
+        LogLine("listening on 127.0.0.1 alone: this machine has no ::1");
+        return;
+      }
+      if (!IsPortTaken(failure) || left <= 1) {
+        throw;
+      }
+    }
+  }
+}
+
+void HttpsListener::Start() {
+  for (Acceptor &acceptor : m_acceptors) {
+    Accept(acceptor);
+  }
+  const unsigned count = std::max(LEAST_THREADS, std::thread::hardware_concurrency());
+  for (unsigned i = 0; i < count; ++i) {
+    m_threads.emplace_back([this] { m_context.run(); });
+  }
+}
+
+void HttpsListener::Accept(Acceptor &acceptor) {
+  acceptor.async_accept(asio::make_strand(m_context), [this, &acceptor](const ErrorCode &error, tcp::socket socket) {
+    if (!error && m_connections < MOST_CONNECTIONS) {
+      std::make_shared<Connection>(std::move(socket), m_tls, m_handler, m_connections)->Start();
+    }
+    if (error) {
+      LogLine("cannot take a connection: " + error.message());
+      std::this_thread::sleep_for(PAUSE_WITHOUT_DESCRIPTORS);
+    }
+    Accept(acceptor);
+  });
+}
+
+} // namespace DevSts

@@ -1,0 +1,78 @@
+// SPDX-License-Identifier: Apache-2.0
+/// @file
+/// The development token service: starts, tells that it is ready, ends when it is told to.
+
+#include "https_listener.h"
+#include "options.h"
+#include "request_handler.h"
+#include "shutdown.h"
+#include "signature_engine.h"
+#include "state_folder.h"
+#include "token_service.h"
+#include "users.h"
+
+#include <nlohmann/json.hpp>
+
+#include <cstdio>
+#include <stdexcept>
+
+#include <sys/resource.h>
+#include <unistd.h>
+
+namespace DevSts {
+namespace {
+
+/// As many connections as the machine's administrator allows.
+void RaiseDescriptorLimit() {
+  rlimit limit{};
+  if (getrlimit(RLIMIT_NOFILE, &limit) == 0) {
+    limit.rlim_cur = limit.rlim_max;
+    setrlimit(RLIMIT_NOFILE, &limit);
+  }
+}
+
+void WriteReadyLine(const StateFolder &state, std::uint16_t port) {
+  const nlohmann::ordered_json ready = {{"schema", 1},
+                                        {"url", "https://localhost:" + std::to_string(port) + "/sts"},
+                                        {"port", port},
+                                        {"pid", getpid()},
+                                        {"ca", state.authority.certificateFile.string()},
+                                        {"trust", state.signing.certificateFile.string()},
+                                        {"thumbprint", ThumbprintOf(*state.tls.certificate)}};
+  if (std::puts(ready.dump().c_str()) < 0 || std::fflush(stdout) != 0) {
+    throw std::runtime_error("standard output cannot be written");
+  }
+}
+
+void Serve(const Options &options) {
+  if (options.keytab) {
+    throw std::runtime_error("--keytab: this build cannot negotiate");
+  }
+  const EndSignals endSignals;
+  RaiseDescriptorLimit();
+  const SignatureEngine engine;
+  const StateFolder state = OpenStateFolder(options.state);
+  const TokenService service(state, options.users ? Users(*options.users) : Users(), options.tolerance);
+  const RequestHandler handler(service, options.fault);
+  HttpsListener listener(state.tls, options.port, handler);
+  listener.Start();
+  WriteReadyLine(state, listener.GetPort());
+  endSignals.Wait(options.untilEof);
+}
+
+} // namespace
+} // namespace DevSts
+
+int main(int argc, char **argv) {
+  try {
+    const std::variant<DevSts::Options, int> options = DevSts::ReadOptions(argc, argv);
+    if (const int *exitCode = std::get_if<int>(&options)) {
+      return *exitCode;
+    }
+    DevSts::Serve(std::get<DevSts::Options>(options));
+    return 0;
+  } catch (const std::exception &failure) {
+    std::fprintf(stderr, "ssoclient-devsts: %s\n", failure.what());
+    return 1;
+  }
+}

@@ -1,0 +1,48 @@
+// SPDX-License-Identifier: Apache-2.0
+/// @file
+/// The checks that each message passes before the service looks at what it asks for: form, timestamp, signature.
+
+#pragma once
+
+#include "certificate.h"
+#include "signature_engine.h"
+#include "token_facts.h"
+#include "xml_tree.h"
+
+#include <chrono>
+#include <optional>
+#include <string>
+#include <string_view>
+
+namespace DevSts {
+
+struct PasswordCredentials {
+  std::string name;
+  std::string password; // NOLINT: a development service's, named in its own documentation
+};
+
+/// A message that has been checked. Nodes belong to `document`.
+struct CheckedMessage {
+  Document document;
+  Identifiers identifiers;
+  xmlNode *request = nullptr;                     ///< the one element in the body
+  std::optional<PasswordCredentials> credentials; ///< not yet compared with anything
+  std::optional<TokenFacts> presentedToken;       ///< from the header: ours, current, and the signer's own
+  /// Set when the message is signed: over the body and the timestamp, by the key of this certificate.
+  Certificate signer;
+  std::string signatureId; ///< the signature's own identifier, empty for none
+};
+
+/// How far clocks may differ, and who signs tokens.
+struct MessagePolicy {
+  std::chrono::seconds tolerance{60};
+  const SignatureKey *tokenSigner = nullptr;
+};
+
+/// @throws Refusal
+CheckedMessage CheckMessage(std::string_view xml, const MessagePolicy &policy);
+
+/// @throws Refusal (`code`) unless the token is valid now
+void RequireCurrent(const TokenFacts &token, std::chrono::seconds tolerance, const struct FaultCode &code);
+
+} // namespace DevSts

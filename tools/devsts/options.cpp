@@ -1,0 +1,68 @@
+// SPDX-License-Identifier: Apache-2.0
+#include "options.h"
+
+#include <CLI/CLI.hpp>
+
+namespace DevSts {
+
+namespace {
+
+constexpr int USAGE = 2;
+constexpr int LONGEST_TOLERANCE = 24 * 3600;
+
+std::string Footer() {
+  return "Faults:\n" + FaultHelp() +
+         "\nA request to URL/fault/NAME meets that fault alone, whatever --fault says.\n"
+         "\nExamples:\n"
+         "  ssoclient-devsts --state ~/.cache/devsts\n"
+         "      Serves alice@corp.example (password wonderland) and bob@corp.example (password builder) on a free\n"
+         "      port, until it gets SIGTERM or SIGINT. The first line on standard output tells the URL and the files\n"
+         "      to trust.\n"
+         "  ssoclient-devsts --state DIR --port 8443 --users users.json\n"
+         "      users.json: "
+         "[{\"name\":\"carol@corp.example\",\"password\":\"...\",\"first\":\"Carol\",\"last\":\"Danvers\",\n"
+         "      \"groups\":[\"users@corp.example\"]}]\n"
+         "  ssoclient-devsts --state DIR --fault wrong-signer\n"
+         "      Signs every token with a key that nobody trusts.\n";
+}
+
+} // namespace
+
+std::variant<Options, int> ReadOptions(int argc, char **argv) {
+  CLI::App app("A WS-Trust 1.3 token service for development and tests. It listens on loopback alone.",
+               "ssoclient-devsts");
+  app.set_version_flag("--version", "ssoclient-devsts " SSOCLIENT_VERSION);
+  app.footer(Footer());
+
+  Options options;
+  std::string faultName;
+  int tolerance = static_cast<int>(options.tolerance.count());
+  app.add_option("--state", options.state, "Folder of keys and certificates, made when missing")->required();
+  app.add_option("--port", options.port, "Port to listen on; 0 takes a free one")->capture_default_str();
+  app.add_option("--users", options.users, "JSON file of the users; two are known without it")->type_name("FILE");
+  app.add_option("--keytab", options.keytab, "Keytab for SPNEGO negotiation")->type_name("FILE");
+  app.add_option("--fault", faultName, "Misbehave at every request; names below")->type_name("NAME");
+  app.add_option("--tolerance", tolerance, "How far clocks may differ, in seconds")
+      ->capture_default_str()
+      ->check(CLI::Range(0, LONGEST_TOLERANCE));
+  app.add_flag("--until-eof", options.untilEof, "End when standard input ends");
+  try {
+    app.parse(argc, argv);
+    if (!faultName.empty()) {
+      const std::optional<Fault> fault = ParseFault(faultName);
+      if (!fault) {
+        throw CLI::ValidationError("--fault", "no fault is named '" + faultName + "'; see --help");
+      }
+      options.fault = *fault;
+    }
+  } catch (const CLI::Success &success) { // --help and --version
+    return app.exit(success);
+  } catch (const CLI::ParseError &error) {
+    std::cerr << "ssoclient-devsts: " << error.what() << '\n';
+    return USAGE;
+  }
+  options.tolerance = std::chrono::seconds(tolerance);
+  return options;
+}
+
+} // namespace DevSts

@@ -1,0 +1,31 @@
+// SPDX-License-Identifier: Apache-2.0
+/// @file
+/// The command line.
+
+#pragma once
+
+#include "faults.h"
+
+#include <chrono>
+#include <cstdint>
+#include <filesystem>
+#include <optional>
+#include <variant>
+
+namespace DevSts {
+
+struct Options {
+  std::filesystem::path state;
+  std::uint16_t port = 0;
+  std::optional<std::filesystem::path> users;
+  std::optional<std::filesystem::path> keytab;
+  Fault fault;
+  std::chrono::seconds tolerance{60};
+  bool untilEof = false;
+};
+
+/// The options, or the exit code with which the program ends because help was asked for or the line is wrong; that has
+/// been written then.
+std::variant<Options, int> ReadOptions(int argc, char **argv);
+
+} // namespace DevSts

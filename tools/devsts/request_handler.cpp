@@ -1,0 +1,99 @@
+// SPDX-License-Identifier: Apache-2.0
+#include "request_handler.h"
+
+#include <array>
+#include <cctype>
+#include <cstdio>
+#include <string_view>
+
+#include <unistd.h>
+
+namespace DevSts {
+
+namespace {
+
+constexpr std::string_view PATH = "/sts";
+constexpr std::string_view FAULT_PATH = "/sts/fault/";
+constexpr std::string_view MEDIA_TYPE = "text/xml";
+
+std::string Lower(std::string_view text) {
+  std::string lower(text);
+  for (char &c : lower) {
+    c = static_cast<char>(std::tolower(static_cast<unsigned char>(c)));
+  }
+  return lower;
+}
+
+bool IsXml(std::string_view contentType) {
+  const std::string type = Lower(contentType.substr(0, contentType.find(';')));
+  const std::size_t end = type.find_last_not_of(" \t");
+  return end != std::string::npos && type.substr(0, end + 1) == MEDIA_TYPE;
+}
+
+std::string_view Unquoted(std::string_view text) {
+  const bool isQuoted = text.size() >= 2 && text.front() == '"' && text.back() == '"';
+  return isQuoted ? text.substr(1, text.size() - 2) : text;
+}
+
+Delivery Plain(int status, const char *text, bool keepOpen) {
+  return Deliver({status, "text/plain", text}, Fault(), keepOpen);
+}
+
+} // namespace
+
+void LogLine(const std::string &line) noexcept {
+  try {
+    std::string text = TimeText(Now()) + " ";
+    for (const char c : line) {
+      const auto byte = static_cast<unsigned char>(c);
+      const bool isPlain = byte >= 0x20 && byte < 0x7F;
+      std::array<char, 8> escaped{};
+      std::snprintf(escaped.data(), escaped.size(), "\\x%02X", byte);
+      text += isPlain ? std::string(1, c) : std::string(escaped.data());
+    }
+    text += '\n';
+    // One call, so that lines of several threads do not mix. A log that cannot be written stops nothing.
+    [[maybe_unused]] const ssize_t written = write(STDERR_FILENO, text.data(), text.size());
+  } catch (const std::exception &) { // NOLINT(bugprone-empty-catch): out of memory; the line is lost
+  }
+}
+
+Delivery RequestHandler::Answer(const HttpRequest &request) const {
+  Fault fault = m_fault;
+  if (request.target.rfind(FAULT_PATH, 0) == 0) {
+    const std::optional<Fault> named = ParseFault(std::string_view(request.target).substr(FAULT_PATH.size()));
+    if (!named) {
+      return Plain(404, "No fault of that name.\n", request.keepOpen);
+    }
+    fault = *named;
+  } else if (request.target != PATH) {
+    return Plain(404, "The service is at /sts.\n", request.keepOpen);
+  }
+  if (request.method != "POST") {
+    return Plain(405, "Only POST is answered.\n", request.keepOpen);
+  }
+  if (!IsXml(request.contentType)) {
+    return Plain(415, "A SOAP 1.1 message has the media type text/xml.\n", request.keepOpen);
+  }
+  if (IgnoresRequest(fault.delivery)) {
+    LogLine(request.peer + " " + request.target + ": fault");
+    return Deliver({}, fault, request.keepOpen);
+  }
+  const SoapAnswer answer = m_service.Answer(Unquoted(request.soapAction), request.body, fault);
+  LogLine(request.peer + " " + request.target + ": " + answer.log);
+  HttpAnswer http;
+  http.status = answer.status;
+  http.body = answer.body;
+  return Deliver(http, fault, request.keepOpen);
+}
+
+Delivery RequestHandler::Handle(const HttpRequest &request) const noexcept {
+  try {
+    return Answer(request);
+  } catch (const std::exception &failure) {
+    LogLine(request.peer + ": failed: " + failure.what());
+    return Plain(500, "The service has failed; see its log.\n", false);
+  }
+}
+
+} // namespace DevSts

@@ -1,0 +1,42 @@
+// SPDX-License-Identifier: Apache-2.0
+/// @file
+/// From an HTTP request to what is delivered: paths, methods, media types, faults, the log.
+
+#pragma once
+
+#include "delivery.h"
+#include "token_service.h"
+
+#include <string>
+
+namespace DevSts {
+
+struct HttpRequest {
+  std::string peer; ///< address and port, for the log
+  std::string method;
+  std::string target;
+  std::string contentType;
+  std::string soapAction;
+  std::string body;
+  bool keepOpen = true;
+};
+
+/// Any number of threads may use it at once.
+class RequestHandler {
+public:
+  /// `service` outlives the handler. `fault` is that of every request that names none of its own.
+  RequestHandler(const TokenService &service, const Fault &fault) : m_service(service), m_fault(fault) {}
+
+  Delivery Handle(const HttpRequest &request) const noexcept;
+
+private:
+  Delivery Answer(const HttpRequest &request) const;
+
+  const TokenService &m_service;
+  const Fault m_fault;
+};
+
+/// Writes one line to standard error, with a time, and with what could steer a terminal made visible.
+void LogLine(const std::string &line) noexcept;
+
+} // namespace DevSts

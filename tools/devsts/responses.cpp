@@ -1,0 +1,72 @@
+// SPDX-License-Identifier: Apache-2.0
+#include "responses.h"
+
+#include <new>
+
+namespace DevSts {
+
+namespace {
+
+/// An envelope with an empty body.
+Document NewEnvelope() {
+  Document document = NewDocument(Ns::SOAPENV, "Envelope");
+  AddElement(*xmlDocGetRootElement(document.get()), Ns::SOAPENV, "Body");
+  return document;
+}
+
+xmlNode &BodyOf(xmlDoc &envelope) {
+  return *ChildElements(*xmlDocGetRootElement(&envelope)).front();
+}
+
+void AddTokenResponse(xmlNode &parent, const xmlDoc &token) {
+  xmlNode &response = AddElement(parent, Ns::WST, "RequestSecurityTokenResponse");
+  AddElement(response, Ns::WST, "TokenType", SAML_TOKEN_TYPE);
+  xmlNode &requested = AddElement(response, Ns::WST, "RequestedSecurityToken");
+  xmlNode *const copy = xmlDocCopyNode(xmlDocGetRootElement(&token), parent.doc, 1);
+  if (!copy) {
+    throw std::bad_alloc();
+  }
+  xmlAddChild(&requested, copy);
+}
+
+} // namespace
+
+Document IssueResponse(const xmlDoc &token) {
+  Document document = NewEnvelope();
+  AddTokenResponse(AddElement(BodyOf(*document), Ns::WST, "RequestSecurityTokenResponseCollection"), token);
+  return document;
+}
+
+Document RenewResponse(const xmlDoc &token) {
+  Document document = NewEnvelope();
+  AddTokenResponse(BodyOf(*document), token);
+  return document;
+}
+
+Document ValidateResponse(bool isValid) {
+  Document document = NewEnvelope();
+  xmlNode &response = AddElement(BodyOf(*document), Ns::WST, "RequestSecurityTokenResponse");
+  AddElement(response, Ns::WST, "TokenType", std::string(Ns::WST.uri) + "/RSTR/Status");
+  xmlNode &status = AddElement(response, Ns::WST, "Status");
+  AddElement(status, Ns::WST, "Code", std::string(Ns::WST.uri) + (isValid ? "/status/valid" : "/status/invalid"));
+  return document;
+}
+
+Document FaultResponse(const FaultCode *code, const std::string &reason) {
+  Document document = NewEnvelope();
+  xmlNode &fault = AddElement(BodyOf(*document), Ns::SOAPENV, "Fault");
+  // SOAP 1.1 gives the children of a fault no namespace; the code is a qualified name, so its prefix must be declared.
+  const auto add = [&fault](const char *name, const std::string &text) -> xmlNode & {
+    xmlNode &element = AddElement(fault, Ns::SOAPENV, name, text);
+    xmlSetNs(&element, nullptr);
+    return element;
+  };
+  if (code) {
+    xmlNode &element = add("faultcode", std::string(code->ns.prefix) + ":" + code->name);
+    DeclareNamespace(element, code->ns);
+  }
+  add("faultstring", reason);
+  return document;
+}
+
+} // namespace DevSts

@@ -1,0 +1,26 @@
+// SPDX-License-Identifier: Apache-2.0
+/// @file
+/// The SOAP messages that the service answers with.
+
+#pragma once
+
+#include "refusal.h"
+#include "xml_tree.h"
+
+#include <string>
+
+namespace DevSts {
+
+/// The answer to an issue request: the token in a response in a collection.
+Document IssueResponse(const xmlDoc &token);
+
+/// The answer to a renew request: the token in a response.
+Document RenewResponse(const xmlDoc &token);
+
+/// The answer to a validate request.
+Document ValidateResponse(bool isValid);
+
+/// A SOAP fault. A null code leaves the element out.
+Document FaultResponse(const FaultCode *code, const std::string &reason);
+
+} // namespace DevSts

@@ -1,0 +1,25 @@
+// SPDX-License-Identifier: Apache-2.0
+/// @file
+/// Waiting for the reason to end.
+
+#pragma once
+
+namespace DevSts {
+
+/// SIGTERM and SIGINT, caught as long as this lives. Made before any thread starts, so that all of them leave the signals
+/// to it.
+class EndSignals {
+public:
+  EndSignals();
+  EndSignals(const EndSignals &) = delete;
+  EndSignals &operator=(const EndSignals &) = delete;
+  ~EndSignals();
+
+  /// Returns at one of the signals or, when asked to, at the end of standard input.
+  void Wait(bool untilEof) const;
+
+private:
+  int m_descriptor;
+};
+
+} // namespace DevSts

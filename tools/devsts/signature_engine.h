@@ -1,0 +1,57 @@
+// SPDX-License-Identifier: Apache-2.0
+/// @file
+/// XML signatures by libxmlsec1, held to the one profile that messages and tokens use: exclusive C14N, RSA-SHA256, SHA-256.
+
+#pragma once
+
+#include "certificate.h"
+#include "state_folder.h"
+#include "xml_tree.h"
+
+#include <xmlsec/keys.h>
+
+#include <memory>
+#include <string>
+#include <vector>
+
+namespace DevSts {
+
+/// Starts libxml2 and libxmlsec1, and ends them. One for the whole process, before any thread uses either.
+class SignatureEngine {
+public:
+  SignatureEngine();
+  SignatureEngine(const SignatureEngine &) = delete;
+  SignatureEngine &operator=(const SignatureEngine &) = delete;
+  ~SignatureEngine();
+};
+
+struct SignatureKeyDeleter {
+  void operator()(xmlSecKey *key) const noexcept { xmlSecKeyDestroy(key); }
+};
+using SignatureKey = std::unique_ptr<xmlSecKey, SignatureKeyDeleter>;
+
+/// The private key together with its certificate. @throws std::runtime_error
+SignatureKey LoadSigningKey(const Identity &identity);
+
+/// The public key of a certificate. @throws std::runtime_error
+SignatureKey PublicKeyOf(const X509 &certificate);
+
+/// What a reference of a signature says.
+struct SignatureReference {
+  std::string id; ///< of the element that is signed
+  bool isEnveloped = false;
+};
+
+/// The references of a `ds:Signature`, in their order. @throws Refusal (wsse:UnsupportedAlgorithm, wsse:InvalidSecurity)
+/// unless it has exactly the profile's form: one transform, the canonicalisation, preceded by "enveloped" at most
+std::vector<SignatureReference> ReadReferences(const xmlNode &signature);
+
+/// Whether the signature's value and all digests are right, by this key and whatever `KeyInfo` says. The identifiers of
+/// its document have been registered, and `ReadReferences` has passed.
+bool VerifiesWith(xmlNode &signature, const SignatureKey &key);
+
+/// Signs the whole `element`, whose identifier is `id`, with an enveloped signature behind its child `sibling`.
+/// @throws std::runtime_error
+void SignEnveloped(xmlNode &element, const std::string &id, xmlNode &sibling, const SignatureKey &key);
+
+} // namespace DevSts

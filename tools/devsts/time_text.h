@@ -1,0 +1,25 @@
+// SPDX-License-Identifier: Apache-2.0
+/// @file
+/// Points in time and their xsd:dateTime text.
+
+#pragma once
+
+#include <chrono>
+#include <optional>
+#include <string>
+#include <string_view>
+
+namespace DevSts {
+
+/// UTC, in milliseconds.
+using Time = std::chrono::sys_time<std::chrono::milliseconds>;
+
+Time Now();
+
+/// As "2026-01-02T03:04:05.006Z".
+std::string TimeText(Time time);
+
+/// Reads that form, the fraction optional and of any length (cut to milliseconds). Nothing for any other text.
+std::optional<Time> ParseTime(std::string_view text);
+
+} // namespace DevSts

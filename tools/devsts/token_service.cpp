@@ -1,0 +1,221 @@
+// SPDX-License-Identifier: Apache-2.0
+#include "token_service.h"
+
+#include "responses.h"
+#include "token_issuer.h"
+#include "token_reader.h"
+
+#include <algorithm>
+
+namespace DevSts {
+
+namespace {
+
+constexpr std::uint64_t RENEWALS = 10;
+constexpr std::uint64_t DELEGATIONS = 10;
+
+/// "admins@corp.example" as tokens write it: "corp.example\admins".
+std::string GroupText(const std::string &group) {
+  const std::size_t at = group.rfind('@');
+  return group.substr(at + 1) + "\\" + group.substr(0, at);
+}
+
+void SetLife(TokenFacts &facts, std::chrono::milliseconds lifetime) {
+  facts.notBefore = Now();
+  facts.notOnOrAfter = facts.notBefore + lifetime;
+}
+
+/// The key that a holder-of-key token is to confirm is the one that has signed the request.
+std::string ProofCertificate(const CheckedMessage &message, const TrustRequest &request) {
+  if (!request.wantsHolderOfKey) {
+    return {};
+  }
+  if (!message.signer) {
+    throw Refusal(Code::INVALID_REQUEST, "a holder-of-key token is asked for without proof of a key");
+  }
+  // An exchange names no key: it is the presented token's.
+  const bool mayOmitUseKey = message.presentedToken.has_value();
+  if (request.useKey ? *request.useKey != message.signatureId : !mayOmitUseKey) {
+    throw Refusal(Code::INVALID_REQUEST, "wst:UseKey does not name the message's signature");
+  }
+  return EncodeCertificate(*message.signer);
+}
+
+void ApplyDelegation(TokenFacts &facts, const TrustRequest &request, const CheckedMessage &message) {
+  std::uint64_t allowed = DELEGATIONS;
+  if (message.presentedToken) {
+    allowed = message.presentedToken->delegations;
+    if (request.delegateTo && allowed == 0) {
+      throw Refusal(Code::REQUEST_FAILED, "the presented token may not be delegated");
+    }
+    allowed -= request.delegateTo ? 1U : 0U;
+  }
+  if (request.delegateTo) {
+    facts.delegation.push_back({*request.delegateTo, Now()});
+  }
+  facts.delegations = request.delegable ? allowed : 0;
+}
+
+void RequireAction(std::string_view action, const char *message, const TrustRequest &request) {
+  const std::string expected = std::string(Ns::WST.uri) + message + RequestTypeName(request.type);
+  if (action != expected) {
+    throw Refusal(Code::INVALID_REQUEST, "the SOAPAction does not fit the message");
+  }
+}
+
+std::string Summary(const char *what, const TokenFacts &facts, const xmlDoc &token) {
+  return std::string(what) + " " + TokenId(token) + " for " + facts.subject +
+         (facts.certificate.empty() ? " (bearer)" : " (holder-of-key)");
+}
+
+} // namespace
+
+TokenService::TokenService(const StateFolder &state, Users users, std::chrono::seconds tolerance)
+    : m_state(state), m_users(std::move(users)), m_signer(LoadSigningKey(state.signing)),
+      m_foreignSigner(LoadSigningKey(state.foreign)),
+      m_verifier(PublicKeyOf(*state.signing.certificate)), m_policy{tolerance, &m_verifier} {}
+
+SoapAnswer TokenService::Answer(std::string_view action, std::string_view message, const Fault &fault) const {
+  SoapAnswer answer;
+  try {
+    const Document response = Process(action, message, fault, answer.log);
+    if (fault.document == DocumentFault::SOAP_FAULT) {
+      throw Refusal(fault.code, "a fault was asked for");
+    }
+    if (fault.document == DocumentFault::SOAP_FAULT_WITHOUT_CODE) {
+      return {500, Serialise(*FaultResponse(nullptr, "a fault was asked for")), "fault without code"};
+    }
+    answer.body = SpoilResponse(*response, fault.document);
+  } catch (const Refusal &refusal) {
+    const FaultCode &code = refusal.GetCode();
+    answer.status = 500;
+    answer.body = Serialise(*FaultResponse(&code, refusal.what()));
+    answer.log = std::string("refused, ") + code.ns.prefix + ":" + code.name + ": " + refusal.what();
+  }
+  return answer;
+}
+
+Document TokenService::Process(std::string_view action, std::string_view message, const Fault &fault,
+                               std::string &log) const {
+  const CheckedMessage checked = CheckMessage(message, m_policy);
+  const TrustRequest request = ReadTrustRequest(*checked.request);
+  RequireAction(action, "/RST/", request);
+  switch (request.type) {
+  case RequestType::RENEW:
+    return Renew(checked, request, fault, log);
+  case RequestType::VALIDATE:
+    return Validate(checked, request, log);
+  case RequestType::ISSUE:
+    break;
+  }
+  return Issue(checked, request, fault, log);
+}
+
+Document TokenService::Issue(const CheckedMessage &message, const TrustRequest &request, const Fault &fault,
+                             std::string &log) const {
+  TokenFacts facts = Authenticate(message);
+  facts.certificate = ProofCertificate(message, request);
+  facts.audience = request.audience;
+  facts.advice = request.advice;
+  facts.renewals = request.renewable ? RENEWALS : 0;
+  ApplyDelegation(facts, request, message);
+  SetLife(facts, request.lifetime);
+  const Document token = MakeToken(facts, fault.token);
+  log = Summary(message.presentedToken ? "exchanged, issued" : "issued", facts, *token);
+  return IssueResponse(*token);
+}
+
+Document TokenService::Renew(const CheckedMessage &message, const TrustRequest &request, const Fault &fault,
+                             std::string &log) const {
+  if (!message.signer) {
+    throw Refusal(Code::INVALID_SECURITY, "a renewal must be signed");
+  }
+  TokenFacts facts;
+  try {
+    facts = ReadIssuedToken(*request.target, message.identifiers, m_verifier);
+  } catch (const Refusal &refusal) {
+    throw Refusal(Code::INVALID_TARGET, refusal.what());
+  }
+  if (facts.certificate != EncodeCertificate(*message.signer)) {
+    throw Refusal(Code::FAILED_AUTHENTICATION, "the renewal is not signed by the holder of the token's key");
+  }
+  if (facts.renewals == 0) {
+    throw Refusal(Code::UNABLE_TO_RENEW, "the token is not renewable");
+  }
+  RequireCurrent(facts, m_policy.tolerance, Code::UNABLE_TO_RENEW);
+  --facts.renewals;
+  SetLife(facts, request.lifetime);
+  const Document token = MakeToken(facts, fault.token);
+  log = Summary("renewed, issued", facts, *token);
+  return RenewResponse(*token);
+}
+
+Document TokenService::Validate(const CheckedMessage &message, const TrustRequest &request, std::string &log) const {
+  try {
+    RequireCurrent(ReadIssuedToken(*request.target, message.identifiers, m_verifier), m_policy.tolerance,
+                   Code::INVALID_TARGET);
+    log = "valid";
+    return ValidateResponse(true);
+  } catch (const Refusal &refusal) {
+    log = std::string("not valid: ") + refusal.what();
+    return ValidateResponse(false);
+  }
+}
+
+TokenFacts TokenService::Authenticate(const CheckedMessage &message) const {
+  if (message.presentedToken && message.credentials) {
+    throw Refusal(Code::INVALID_SECURITY, "the message presents both a token and a password");
+  }
+  if (message.presentedToken) {
+    return *message.presentedToken;
+  }
+  if (message.credentials) {
+    return FactsOfUser(*message.credentials);
+  }
+  if (message.signer) {
+    return FactsOfCertificate(*message.signer);
+  }
+  throw Refusal(Code::FAILED_AUTHENTICATION, "the message holds nothing that tells who sent it");
+}
+
+TokenFacts TokenService::FactsOfUser(const PasswordCredentials &credentials) const {
+  const User *const user = m_users.Authenticate(credentials.name, credentials.password);
+  if (!user) {
+    throw Refusal(Code::FAILED_AUTHENTICATION, "unknown user or wrong password");
+  }
+  TokenFacts facts;
+  facts.subject = user->name;
+  facts.authenticated = Now();
+  facts.context = PASSWORD_CONTEXT;
+  facts.first = user->first;
+  facts.last = user->last;
+  std::transform(user->groups.begin(), user->groups.end(), std::back_inserter(facts.groups), GroupText);
+  return facts;
+}
+
+TokenFacts TokenService::FactsOfCertificate(X509 &certificate) const {
+  const std::string principal = PrincipalOf(certificate);
+  if (principal.empty() || !IsClientOf(certificate, *m_state.authority.certificate)) {
+    throw Refusal(Code::FAILED_AUTHENTICATION, "the certificate is none that the service's authority gave a client");
+  }
+  TokenFacts facts;
+  facts.subject = principal;
+  facts.authenticated = Now();
+  facts.context = CERTIFICATE_CONTEXT;
+  facts.isSolution = true;
+  return facts;
+}
+
+Document TokenService::MakeToken(TokenFacts facts, TokenFault fault) const {
+  SpoilFacts(facts, fault);
+  Document token = BuildToken(facts);
+  if (fault != TokenFault::UNSIGNED) {
+    SignToken(*token, fault == TokenFault::WRONG_SIGNER ? m_foreignSigner : m_signer);
+  }
+  if (fault == TokenFault::TAMPERED) {
+    TamperWith(*token);
+  }
+  return token;
+}
+
+} // namespace DevSts

@@ -1,0 +1,76 @@
+// SPDX-License-Identifier: Apache-2.0
+/// @file
+/// Reading and building libxml2 trees.
+
+#pragma once
+
+#include "names.h"
+
+#include <libxml/tree.h>
+
+#include <map>
+#include <memory>
+#include <optional>
+#include <string>
+#include <string_view>
+#include <vector>
+
+namespace DevSts {
+
+struct DocumentDeleter {
+  void operator()(xmlDoc *document) const noexcept { xmlFreeDoc(document); }
+};
+using Document = std::unique_ptr<xmlDoc, DocumentDeleter>;
+
+inline const xmlChar *XmlText(const char *text) {
+  return reinterpret_cast<const xmlChar *>(text);
+}
+
+/// A message from the network: no DOCTYPE, no entities but the predefined ones, nothing fetched, at most 256 levels.
+/// @throws Refusal (soapenv:Client)
+Document ParseMessage(std::string_view xml);
+
+bool IsElement(const xmlNode &node, const Namespace &ns, std::string_view name);
+
+/// The children that are elements, in document order.
+std::vector<xmlNode *> ChildElements(const xmlNode &parent);
+
+/// The child of that name, null for none. @throws Refusal (wst:InvalidRequest) when there are several
+xmlNode *FindChild(const xmlNode &parent, const Namespace &ns, std::string_view name);
+
+/// The child of that name. @throws Refusal (wst:InvalidRequest) when there is not exactly one
+xmlNode &RequireChild(const xmlNode &parent, const Namespace &ns, std::string_view name);
+
+/// The text of an element that holds nothing but text. @throws Refusal (wst:InvalidRequest) when it holds anything else
+std::string TextOf(const xmlNode &element);
+
+/// The attribute without namespace.
+std::optional<std::string> AttributeOf(const xmlNode &element, const char *name);
+std::optional<std::string> AttributeOf(const xmlNode &element, const Namespace &ns, const char *name);
+
+/// The elements of a document by their identifiers: the attributes ID, Id, wsu:Id and xml:id.
+using Identifiers = std::map<std::string, xmlNode *>;
+
+/// Collects the identifiers and makes them known to libxml2, and so to the signature engine.
+/// @throws Refusal (wsse:InvalidSecurity) when one stands twice, or one element has several
+Identifiers RegisterIdentifiers(xmlDoc &document);
+
+/// A document whose root is a new element.
+Document NewDocument(const Namespace &ns, const char *rootName);
+
+/// Declares the namespace on the element.
+void DeclareNamespace(xmlNode &element, const Namespace &ns);
+
+/// Appends an element, with the namespace's prefix as it is in scope, or declared on the new element.
+xmlNode &AddElement(xmlNode &parent, const Namespace &ns, const char *name, std::string_view text = {});
+
+void SetAttribute(xmlNode &element, const char *name, const std::string &value);
+/// The namespace is declared on the element when it is not in scope.
+void SetAttribute(xmlNode &element, const Namespace &ns, const char *name, const std::string &value);
+
+void SetText(xmlNode &element, std::string_view text);
+
+/// The document as UTF-8, without an XML declaration.
+std::string Serialise(xmlDoc &document);
+
+} // namespace DevSts
