@@ -4,6 +4,7 @@
 
 #pragma once
 
+#include "exit_code.h"
 #include "output.h"
 
 #include <CLI/CLI.hpp>
@@ -12,8 +13,9 @@
 
 namespace SsoClient::Tool {
 
-/// What a command does once its command line is read. Failures leave it as exceptions.
-using Action = std::function<void()>;
+/// What a command does once its command line is read. Failures leave it as exceptions; the exit code that it returns is
+/// its answer.
+using Action = std::function<ExitCode()>;
 
 struct Command {
   const char *name;
@@ -24,6 +26,9 @@ struct Command {
   Action (*define)(CLI::App &app, const OutputOptions &output);
 };
 
+Action DefineAcquire(CLI::App &app, const OutputOptions &output);
+Action DefineRenew(CLI::App &app, const OutputOptions &output);
+Action DefineValidate(CLI::App &app, const OutputOptions &output);
 Action DefineVerify(CLI::App &app, const OutputOptions &output);
 Action DefineInspect(CLI::App &app, const OutputOptions &output);
 

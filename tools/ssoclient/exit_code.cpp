@@ -7,6 +7,7 @@
 #include <ssoclient/exceptions.h>
 #include <tarvel/core/exception.h>
 #include <tarvel/crypto/private_key.h>
+#include <tarvel/http/url.h>
 #include <tarvel/xml/parser.h>
 #include <tarvel/xml/security/exceptions.h>
 
@@ -62,7 +63,9 @@ constexpr Row TABLE[] = {
     {IsA<Tarvel::Crypto::KeyMismatchException>, {ExitCode::FILE_OR_KEY, "KeyMismatchException", "key"}},
     {IsA<Tarvel::Crypto::CryptoException>, {ExitCode::FILE_OR_KEY, "CryptoException", "key or certificate"}},
     {IsA<SsoException>, {ExitCode::SERVICE_FAULT, "SsoException", "service fault"}},
-    {IsA<Tarvel::InvalidArgumentException>, {ExitCode::UNEXPECTED, "InvalidArgumentException", "unexpected failure"}},
+    // All arguments of the library come from the command line: an address, a name that XML cannot carry.
+    {IsA<Tarvel::Http::MalformedURLException>, {ExitCode::USAGE, "MalformedURLException", "usage"}},
+    {IsA<Tarvel::InvalidArgumentException>, {ExitCode::USAGE, "InvalidArgumentException", "usage"}},
     {IsA<Tarvel::InvalidStateException>, {ExitCode::UNEXPECTED, "InvalidStateException", "unexpected failure"}},
     {IsA<Tarvel::Exception>, {ExitCode::UNEXPECTED, "Exception", "unexpected failure"}},
     {IsA<std::bad_alloc>, {ExitCode::UNEXPECTED, "bad_alloc", "out of memory"}},

@@ -4,6 +4,7 @@
 
 #include "command.h"
 #include "token_report.h"
+#include "trust.h"
 
 #include <tarvel/xml/parser.h>
 
@@ -13,10 +14,11 @@ namespace SsoClient::Tool {
 
 Action DefineInspect(CLI::App &app, const OutputOptions &output) {
   const auto file = std::make_shared<std::string>();
-  app.add_option("FILE", *file, "The token, an XML file; \"-\" is standard input")->required()->type_name("");
+  AddTokenArgument(app, *file);
   return [file, &output] {
     // One octet more than the parser takes, so that the parser is the one to refuse it.
     WriteOutput(Render(InspectToken(ReadInput(*file, Tarvel::Xml::MAX_DOCUMENT_BYTES + 1)), output.format));
+    return ExitCode::DONE;
   };
 }
 

@@ -4,16 +4,30 @@
 
 #include "command.h"
 #include "exit_code.h"
+#include "interruption.h"
 
-#include <csignal>
 #include <map>
-
-#include <unistd.h>
 
 namespace SsoClient::Tool {
 namespace {
 
 constexpr Command COMMANDS[] = {
+    {"acquire", "Ask the service for a token: by password, in exchange for a token, or by an identity",
+     "  ssoclient acquire --sts https://sts.corp.example/sts --ca ca.pem --trust sts.pem --user alice@corp.example\n"
+     "  ssoclient acquire --sts https://sts.corp.example/sts --ca ca.pem --trust sts.pem \\\n"
+     "      --user alice@corp.example --password-file password.txt --out alice.xml\n"
+     "  ssoclient acquire --sts https://sts.corp.example/sts --ca ca.pem --trust sts.pem \\\n"
+     "      --cert client.pem --key client.key --renewable --delegable --out client.xml\n"
+     "  ssoclient acquire --sts https://sts.corp.example/sts --ca ca.pem --trust sts.pem \\\n"
+     "      --cert client.pem --key client.key --token client.xml --delegate-to bob@corp.example --lifetime 15m\n",
+     DefineAcquire},
+    {"renew", "Ask the service for a new token in place of a renewable one",
+     "  ssoclient renew --sts https://sts.corp.example/sts --ca ca.pem --trust sts.pem \\\n"
+     "      --cert client.pem --key client.key --lifetime 1d --out client.xml --force client.xml\n",
+     DefineRenew},
+    {"validate", "Ask the service whether it holds a token to be valid",
+     "  ssoclient validate --sts https://sts.corp.example/sts --ca ca.pem --trust sts.pem client.xml\n",
+     DefineValidate},
     {"verify", "Check a token as a relying service does, and show what is in it",
      "  ssoclient verify --trust sts.pem token.xml\n"
      "  ssoclient verify --trust sts.pem --trust next-sts.pem --tolerance 60 --format json - <token.xml\n",
@@ -23,21 +37,6 @@ constexpr Command COMMANDS[] = {
      "  ssoclient inspect --format json - <token.xml\n",
      DefineInspect},
 };
-
-// Nothing is half done at any time that a later run could trip over, so the process may end on the spot.
-extern "C" void EndInterrupted(int) {
-  _exit(static_cast<int>(ExitCode::INTERRUPTED));
-}
-
-void CatchInterrupt() {
-  struct sigaction previous = {};
-  // A shell starts background work with SIGINT ignored, and it must stay so.
-  if (sigaction(SIGINT, nullptr, &previous) == 0 && previous.sa_handler != SIG_IGN) {
-    struct sigaction action = {};
-    action.sa_handler = EndInterrupted;
-    sigaction(SIGINT, &action, nullptr);
-  }
-}
 
 /// The format that the command line asks for, also when it cannot be read as a whole.
 Format RequestedFormat(int argc, char **argv) {
@@ -51,6 +50,31 @@ Format RequestedFormat(int argc, char **argv) {
   return Format::TEXT;
 }
 
+/// What the command `app` has no place for: its unknown options, or else its arguments. What stands behind an unknown option
+/// is left out, for it may be a secret that somebody tried to give there.
+std::string DescribeExtras(const CLI::App &app) {
+  std::string options;
+  std::string arguments;
+  for (const std::string &extra : app.remaining()) {
+    if (extra.size() > 1 && extra.front() == '-') {
+      options += " " + extra.substr(0, extra.find('='));
+    } else {
+      arguments += " " + extra;
+    }
+  }
+  return "not expected:" + (options.empty() ? arguments : options);
+}
+
+std::string Explain(const CLI::App &app, const CLI::ParseError &error) {
+  if (app.get_subcommands().empty() && !app.remaining().empty()) {
+    return "unknown command or option '" + app.remaining().front() + "'";
+  }
+  if (dynamic_cast<const CLI::ExtrasError *>(&error)) {
+    return DescribeExtras(*app.get_subcommands().front());
+  }
+  return error.what();
+}
+
 void AddOutputOptions(CLI::App &app, OutputOptions &output) {
   static const std::map<std::string, Format> FORMATS = {
       {"text", Format::TEXT}, {"json", Format::JSON}, {"xml", Format::XML}};
@@ -60,11 +84,13 @@ void AddOutputOptions(CLI::App &app, OutputOptions &output) {
       ->check(CLI::IsMember({"text", "json", "xml"}))
       ->default_str("text")
       ->type_name("FORMAT");
-  app.add_flag("-v,--verbose", output.verbose, "Write warnings also when the format is not text");
+  app.add_flag("-v,--verbose", output.verbose,
+               "Write the library's log lines to standard error, and warnings whatever the format");
 }
 
 int Run(int argc, char **argv) {
-  CLI::App app("Acquires, verifies and shows SAML 2.0 tokens of a WS-Trust 1.3 token service.", "ssoclient");
+  CLI::App app("Acquires, renews, validates, verifies and shows SAML 2.0 tokens of a WS-Trust 1.3 token service.",
+               "ssoclient");
   app.set_version_flag("--version", "ssoclient " SSOCLIENT_VERSION);
   app.footer(ExitCodeHelp());
   app.require_subcommand(1);
@@ -83,13 +109,12 @@ int Run(int argc, char **argv) {
   } catch (const CLI::Success &success) { // --help and --version
     return app.exit(success);
   } catch (const CLI::ParseError &error) {
-    if (app.get_subcommands().empty() && !app.remaining().empty()) {
-      throw UsageException("unknown command or option '" + app.remaining().front() + "'; see ssoclient --help");
-    }
-    throw UsageException(std::string(error.what()) + "; see ssoclient --help");
+    throw UsageException(Explain(app, error) + "; see ssoclient --help");
   }
-  chosen();
-  return static_cast<int>(ExitCode::DONE);
+  if (output.verbose) {
+    ShowLibraryLog();
+  }
+  return static_cast<int>(chosen());
 }
 
 } // namespace
@@ -98,7 +123,7 @@ int Run(int argc, char **argv) {
 int main(int argc, char **argv) {
   using namespace SsoClient::Tool;
   try {
-    CatchInterrupt();
+    CatchEndingSignals();
     return Run(argc, argv);
   } catch (const std::exception &failure) {
     ReportFailure(failure, RequestedFormat(argc, argv));

@@ -5,8 +5,10 @@
 #include "output.h"
 
 #include "exit_code.h"
+#include "input_descriptor.h"
 
 #include <tarvel/core/exception.h>
+#include <tarvel/service/app.h>
 
 #include <nlohmann/json.hpp>
 
@@ -15,37 +17,10 @@
 #include <cstdio>
 #include <cstring>
 
-#include <fcntl.h>
 #include <unistd.h>
 
 namespace SsoClient::Tool {
 namespace {
-
-/// A file descriptor that is closed at the end, unless it is standard input.
-class InputFile {
-public:
-  explicit InputFile(const std::string &path) : m_descriptor(path == "-" ? STDIN_FILENO : Open(path)) {}
-  InputFile(const InputFile &) = delete;
-  InputFile &operator=(const InputFile &) = delete;
-  ~InputFile() {
-    if (m_descriptor != STDIN_FILENO) {
-      close(m_descriptor);
-    }
-  }
-
-  int Get() const { return m_descriptor; }
-
-private:
-  static int Open(const std::string &path) {
-    const int descriptor = open(path.c_str(), O_RDONLY | O_CLOEXEC);
-    if (descriptor < 0) {
-      throw Tarvel::IOException(path + ": " + std::strerror(errno));
-    }
-    return descriptor;
-  }
-
-  int m_descriptor;
-};
 
 bool CanSteerTerminal(unsigned codePoint) {
   return codePoint < 0x20 || (codePoint >= 0x7F && codePoint <= 0x9F) || codePoint == 0x61C ||
@@ -108,7 +83,7 @@ std::string Printable(std::string_view text) {
 }
 
 std::string ReadInput(const std::string &path, std::size_t limit) {
-  const InputFile file(path);
+  const InputDescriptor file(path);
   std::string content;
   std::array<char, 65536> buffer;
   while (content.size() < limit) {
@@ -136,6 +111,13 @@ void WriteOutput(std::string_view text) {
 void Warn(std::string_view message) {
   const std::string line = "ssoclient: warning: " + Printable(message) + "\n";
   std::fputs(line.c_str(), stderr);
+}
+
+void ShowLibraryLog() {
+  Tarvel::Service::GetApp().GetRootLogger()->SetSink([](const Tarvel::Service::LogRecord &record) {
+    const std::string line = "ssoclient: log: " + Printable(record.message) + "\n";
+    std::fputs(line.c_str(), stderr);
+  });
 }
 
 void ReportFailure(const std::exception &failure, Format format) {

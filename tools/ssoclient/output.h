@@ -34,6 +34,9 @@ void WriteOutput(std::string_view text);
 /// One line on standard error.
 void Warn(std::string_view message);
 
+/// From now on each line that the library logs goes to standard error, as a line of its own.
+void ShowLibraryLog();
+
 /// Tells of `failure` on standard error: one line of text, or one of JSON when that is the format.
 void ReportFailure(const std::exception &failure, Format format);
 

@@ -2,6 +2,7 @@
 
 #include <tarvel/crypto/private_key.h>
 
+#include "crypto/key_file.h"
 #include "crypto/openssl_errors.h"
 #include "crypto/openssl_handles.h"
 #include "crypto/passphrase.h"
@@ -97,6 +98,11 @@ KeyStore CreateKeyStoreFromPkcs12(std::string_view der, const PassphraseCallback
     result.others.push_back(ToCertificate(sk_X509_value(native.others.get(), i)));
   }
   return result;
+}
+
+KeyStore LoadKeyStore(const std::string &path, const PassphraseCallback &passphrase) {
+  const KeyFileText file(path);
+  return NamingPath(path, [&] { return CreateKeyStoreFromPkcs12(file.Get(), passphrase); });
 }
 
 } // namespace Tarvel::Crypto

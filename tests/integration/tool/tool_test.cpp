@@ -1,6 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 // What the tool prints and how it ends, whole.
 
+#include "expect_result.h"
 #include "process.h"
 
 #include "support/data_file.h"
@@ -183,12 +184,6 @@ private:
   std::string m_path;
 };
 
-void ExpectResult(const Result &result, int exitCode, const std::string &out, const std::string &err) {
-  EXPECT_EQ(exitCode, result.exitCode);
-  EXPECT_EQ(out, result.out);
-  EXPECT_EQ(err, result.err);
-}
-
 TEST(Verify, ShowsAVerifiedTokenAsText) {
   ExpectResult(RunTool({"verify", "--trust", "sts-rsa.crt", "full.xml"}), 0,
                "Verified:        yes\n" + WithHolder(FULL_TEXT), "");
@@ -330,7 +325,7 @@ const Refusal REFUSALS[] = {
      2,
      "UsageException",
      "usage",
-     "The following argument was not expected: --nope; see ssoclient --help"},
+     "not expected: --nope; see ssoclient --help"},
 };
 
 class VerifyRefusal : public testing::TestWithParam<Refusal> {};

@@ -254,6 +254,20 @@ TEST(CreateKeyStoreFromPkcs12, RefusesPrefixesAndBytesBehind) {
   EXPECT_EQ(ERR_peek_error(), 0U);
 }
 
+TEST(LoadKeyStore, GivesWhatTheFileHolds) {
+  EXPECT_EQ(LoadKeyStore(FixturePath("rsa2048.p12"), GivePassphrase).privateKey->GetAlgorithm(), "RSA");
+}
+
+TEST(LoadKeyStore, NamesThePathInEachRefusal) {
+  EXPECT_THROWS_MESSAGE(LoadKeyStore("/nowhere.p12", {}), Tarvel::IOException,
+                        "Cannot open /nowhere.p12: No such file or directory");
+  EXPECT_THROWS_MESSAGE(LoadKeyStore(FixturePath("certificate-only.p12"), GivePassphrase), NoKeyException,
+                        FixturePath("certificate-only.p12") + ": There is no private key in the PKCS#12 key store");
+  EXPECT_THAT(
+      MessageOf<WrongPassphraseException>([] { LoadKeyStore(FixturePath("rsa2048.p12"), GiveWrongPassphrase); }),
+      testing::StartsWith(FixturePath("rsa2048.p12") + ": "));
+}
+
 TEST(RequireKeyMatchesCertificate, RefusesAnotherKeyOfTheSameAndOfAnotherKind) {
   const auto certificate = FixtureCertificate("rsa2048");
   const std::string message = "The private key is not the one of the certificate CN=rsa2048,O=Example";

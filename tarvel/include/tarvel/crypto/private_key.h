@@ -69,6 +69,11 @@ struct KeyStore {
 /// @throws as `CreatePrivateKey`; `CryptoException` also when there is no certificate for the key.
 TARVEL_API KeyStore CreateKeyStoreFromPkcs12(std::string_view der, const PassphraseCallback &passphrase);
 
+/// What a PKCS#12 file at `path` holds.
+/// @throws IOException when the file cannot be read; else as `CreateKeyStoreFromPkcs12`, the message beginning with the
+/// path.
+TARVEL_API KeyStore LoadKeyStore(const std::string &path, const PassphraseCallback &passphrase);
+
 /// @throws KeyMismatchException unless `key` is the private key of `certificate`.
 TARVEL_API void RequireKeyMatchesCertificate(const PrivateKey &key, const Certificate &certificate);
 

@@ -1,0 +1,48 @@
+// SPDX-License-Identifier: Apache-2.0
+/// @file
+/// Running the tool at a terminal of its own.
+
+#pragma once
+
+#include <string>
+#include <vector>
+
+#include <sys/types.h>
+
+namespace ToolTest {
+
+/// The tool at a new pseudo-terminal, which is its standard input, output and error, and its controlling terminal. What
+/// waits gives up after half a minute by an exception.
+class TerminalSession {
+public:
+  /// Starts the tool with `arguments` in `folder`.
+  TerminalSession(const std::vector<std::string> &arguments, const std::string &folder);
+  TerminalSession(const TerminalSession &) = delete;
+  TerminalSession &operator=(const TerminalSession &) = delete;
+  ~TerminalSession();
+
+  /// Reads on until the terminal shows `text`.
+  void WaitFor(const std::string &text);
+  void Type(const std::string &text);
+  /// Whether the terminal echoes what is typed.
+  bool Echoes() const;
+  /// Whether the process is stopped, asked without waiting.
+  bool IsStopped() const;
+
+  void Signal(int signal);
+  /// The exit code, or 128 plus the signal that ended the tool; reads what is still shown.
+  int Finish();
+
+  /// All that the terminal has shown so far, its line ends as CR LF.
+  const std::string &Shown() const { return m_shown; }
+
+private:
+  bool ReadSome(int timeoutMs);
+
+  int m_master = -1;
+  int m_slave = -1; ///< kept open, so that the settings can be asked for after the tool has ended
+  pid_t m_process = -1;
+  std::string m_shown;
+};
+
+} // namespace ToolTest

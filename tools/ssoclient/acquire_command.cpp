@@ -1,0 +1,60 @@
+// SPDX-License-Identifier: Apache-2.0
+/// @file
+/// `ssoclient acquire`: asks the service for a token.
+
+#include "command.h"
+#include "connection.h"
+#include "credentials.h"
+#include "identity.h"
+#include "token_output.h"
+#include "token_spec_options.h"
+#include "trust.h"
+
+#include <memory>
+
+namespace SsoClient::Tool {
+namespace {
+
+struct AcquireOptions {
+  ConnectionOptions connection;
+  TrustOptions trust;
+  CredentialsOptions credentials;
+  IdentityOptions identity;
+  TokenSpecOptions token;
+  TokenOutputOptions tokenOutput;
+};
+
+ExitCode Acquire(const AcquireOptions &options, const OutputOptions &output) {
+  const TokenSpec spec = ToTokenSpec(options.token);
+  const bool hasIdentity = options.identity.IsGiven();
+  const CredentialsKind &kind = ChooseCredentials(options.credentials, hasIdentity);
+  kind.check(spec, hasIdentity);
+  InputClaims claims;
+  ClaimInput(options.credentials, claims);
+  CheckIdentity(options.identity, claims);
+  CheckConnection(options.connection);
+  CheckTokenOutput(options.tokenOutput, output);
+
+  const Tarvel::Crypto::CertificateList trusted = LoadTrusted(options.trust, output);
+  const auto connection = CreateConnection(options.connection, trusted, LoadIdentity(options.identity));
+  const auto token =
+      kind.acquire({*connection.service, spec, options.credentials, trusted, options.trust.toleranceSec});
+  RequireWithinTolerance(*token, trusted, options.trust.toleranceSec);
+  WriteToken(*token, options.tokenOutput, output);
+  return ExitCode::DONE;
+}
+
+} // namespace
+
+Action DefineAcquire(CLI::App &app, const OutputOptions &output) {
+  const auto options = std::make_shared<AcquireOptions>();
+  AddConnectionOptions(app, options->connection);
+  AddCredentialsOptions(app, options->credentials);
+  AddIdentityOptions(app, options->identity);
+  AddTokenSpecOptions(app, options->token);
+  AddTrustOptions(app, options->trust);
+  AddTokenOutputOptions(app, options->tokenOutput);
+  return [options, &output] { return Acquire(*options, output); };
+}
+
+} // namespace SsoClient::Tool

@@ -1,0 +1,123 @@
+// SPDX-License-Identifier: Apache-2.0
+
+#include "atomic_file.h"
+
+#include "interruption.h"
+
+#include <tarvel/core/exception.h>
+
+#include <cerrno>
+#include <cstdio>
+#include <cstdlib>
+#include <cstring>
+
+#include <fcntl.h>
+#include <sys/stat.h>
+#include <unistd.h>
+
+namespace SsoClient::Tool {
+namespace {
+
+[[noreturn]] void ThrowSystemError(const std::string &path, int error) {
+  throw Tarvel::IOException(path + ": " + std::strerror(error));
+}
+
+[[noreturn]] void ThrowExists(const std::string &path) {
+  throw Tarvel::IOException(path + ": is there already; --force replaces it");
+}
+
+std::string FolderOf(const std::string &path) {
+  const std::size_t slash = path.rfind('/');
+  return slash == std::string::npos ? "." : path.substr(0, slash + 1);
+}
+
+/// A new file in a folder, which goes again unless it was published under its final name.
+class TemporaryFile {
+public:
+  explicit TemporaryFile(const std::string &finalPath)
+      : m_finalPath(finalPath), m_path(FolderOf(finalPath) + "/.ssoclient-XXXXXX"),
+        m_descriptor(mkostemp(m_path.data(), O_CLOEXEC)) { // of mode 0600
+    if (m_descriptor < 0) {
+      ThrowSystemError(m_finalPath, errno);
+    }
+  }
+  TemporaryFile(const TemporaryFile &) = delete;
+  TemporaryFile &operator=(const TemporaryFile &) = delete;
+  ~TemporaryFile() {
+    close(m_descriptor);
+    if (!m_isGone) {
+      unlink(m_path.c_str());
+    }
+  }
+
+  void Write(std::string_view content) {
+    while (!content.empty()) {
+      const ssize_t count = write(m_descriptor, content.data(), content.size());
+      if (count < 0 && errno != EINTR) {
+        ThrowSystemError(m_finalPath, errno);
+      }
+      content.remove_prefix(count > 0 ? static_cast<std::size_t>(count) : 0);
+    }
+    if (fsync(m_descriptor) != 0) {
+      ThrowSystemError(m_finalPath, errno);
+    }
+  }
+
+  void PublishReplacing() {
+    if (std::rename(m_path.c_str(), m_finalPath.c_str()) != 0) {
+      ThrowSystemError(m_finalPath, errno);
+    }
+    m_isGone = true;
+  }
+
+  // A link, unlike a renamed file, never takes the place of a file that came meanwhile.
+  void PublishAsNew() {
+    if (link(m_path.c_str(), m_finalPath.c_str()) == 0) {
+      return;
+    }
+    if (errno == EEXIST) {
+      ThrowExists(m_finalPath);
+    }
+    ThrowSystemError(m_finalPath, errno);
+  }
+
+private:
+  std::string m_finalPath;
+  std::string m_path;
+  int m_descriptor;
+  bool m_isGone = false;
+};
+
+} // namespace
+
+void RequireWritableFile(const std::string &path, bool replace) {
+  struct stat status = {};
+  if (lstat(path.c_str(), &status) == 0) {
+    // A device, or the target of a symbolic link, is not what a caller means to replace by a token.
+    if (!S_ISREG(status.st_mode)) {
+      throw Tarvel::IOException(path + ": is no regular file");
+    }
+    if (!replace) {
+      ThrowExists(path);
+    }
+  } else if (errno != ENOENT) {
+    ThrowSystemError(path, errno);
+  }
+  if (access(FolderOf(path).c_str(), W_OK | X_OK) != 0) {
+    ThrowSystemError(path, errno);
+  }
+}
+
+void WriteFileWhole(const std::string &path, std::string_view content, bool replace) {
+  const SignalsHeldBack held;
+  RequireWritableFile(path, replace);
+  TemporaryFile file(path);
+  file.Write(content);
+  if (replace) {
+    file.PublishReplacing();
+  } else {
+    file.PublishAsNew();
+  }
+}
+
+} // namespace SsoClient::Tool

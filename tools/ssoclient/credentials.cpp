@@ -1,0 +1,94 @@
+// SPDX-License-Identifier: Apache-2.0
+
+#include "credentials.h"
+
+#include "exit_code.h"
+
+namespace SsoClient::Tool {
+namespace {
+
+constexpr const char *GROUP = "Credentials";
+
+void CheckNothing(const TokenSpec &, bool) {}
+
+std::shared_ptr<const SamlToken> AcquireByPassword(const AcquireCall &call) {
+  const CredentialsOptions &credentials = call.credentials;
+  const Secret password = ReadSecret(credentials.password, "Password for " + credentials.user + ": ");
+  return call.service.AcquireToken(credentials.user, password.Get(), call.spec);
+}
+
+void CheckExchange(const TokenSpec &, bool hasIdentity) {
+  if (!hasIdentity) {
+    throw UsageException("--token needs an identity to sign with; give --cert and --key, or --p12");
+  }
+}
+
+std::shared_ptr<const SamlToken> AcquireByToken(const AcquireCall &call) {
+  const auto given = ReadToken(call.credentials.tokenFile, call.trusted, call.toleranceSec);
+  return call.service.AcquireTokenByToken(*given, call.spec);
+}
+
+void CheckCertificate(const TokenSpec &spec, bool) {
+  if (spec.confirmation != TokenSpec::CONFIRMATION_DEFAULT) {
+    throw UsageException("--bearer does not go with an identity alone, whose token is bound to its key");
+  }
+}
+
+std::shared_ptr<const SamlToken> AcquireByCertificate(const AcquireCall &call) {
+  return call.service.AcquireTokenByCertificate(call.spec);
+}
+
+constexpr CredentialsKind CHOSEN_KINDS[] = {
+    {"--user", [](const CredentialsOptions &options) { return !options.user.empty(); }, CheckNothing,
+     AcquireByPassword},
+    {"--token", [](const CredentialsOptions &options) { return !options.tokenFile.empty(); }, CheckExchange,
+     AcquireByToken},
+};
+
+constexpr CredentialsKind IDENTITY_ALONE = {nullptr, nullptr, CheckCertificate, AcquireByCertificate};
+
+[[noreturn]] void ThrowNoneChosen() {
+  std::string options;
+  for (const CredentialsKind &kind : CHOSEN_KINDS) {
+    options += std::string(kind.option) + ", ";
+  }
+  throw UsageException("there are no credentials; give " + options + "or an identity (--cert and --key, or --p12)");
+}
+
+} // namespace
+
+void AddCredentialsOptions(CLI::App &app, CredentialsOptions &options) {
+  CLI::Option *user =
+      app.add_option("--user", options.user, "Acquire by password, as this user")->type_name("NAME")->group(GROUP);
+  for (CLI::Option *source : AddSecretOptions(app, options.password, GROUP)) {
+    source->needs(user);
+  }
+  app.add_option("--token", options.tokenFile,
+                 "Acquire in exchange for this token, an XML file; \"-\" is standard input; needs an identity")
+      ->type_name("FILE")
+      ->group(GROUP);
+}
+
+void ClaimInput(const CredentialsOptions &options, InputClaims &claims) {
+  ClaimInput(options.password, claims);
+  claims.ClaimFile(options.tokenFile, "--token");
+}
+
+const CredentialsKind &ChooseCredentials(const CredentialsOptions &options, bool hasIdentity) {
+  const CredentialsKind *chosen = nullptr;
+  for (const CredentialsKind &kind : CHOSEN_KINDS) {
+    if (!kind.isChosen(options)) {
+      continue;
+    }
+    if (chosen) {
+      throw UsageException(std::string(chosen->option) + " and " + kind.option + " exclude each other");
+    }
+    chosen = &kind;
+  }
+  if (!chosen && !hasIdentity) {
+    ThrowNoneChosen();
+  }
+  return chosen ? *chosen : IDENTITY_ALONE;
+}
+
+} // namespace SsoClient::Tool

@@ -1,0 +1,58 @@
+// SPDX-License-Identifier: Apache-2.0
+/// @file
+/// The kinds of credentials that a token can be acquired with.
+
+#pragma once
+
+#include "input_descriptor.h"
+#include "secret_input.h"
+#include "trust.h"
+
+#include <ssoclient/saml_token.h>
+#include <ssoclient/security_token_service.h>
+#include <ssoclient/token_spec.h>
+
+#include <CLI/CLI.hpp>
+
+#include <memory>
+#include <string>
+
+namespace SsoClient::Tool {
+
+struct CredentialsOptions {
+  std::string user;
+  SecretOptions password{"password", {}, -1};
+  std::string tokenFile;
+};
+
+/// Everything that acquiring a token takes, whatever the kind.
+struct AcquireCall {
+  const SecurityTokenService &service;
+  const TokenSpec &spec;
+  const CredentialsOptions &credentials;
+  const Tarvel::Crypto::CertificateList &trusted;
+  std::int64_t toleranceSec;
+};
+
+/// One row of the table of kinds.
+struct CredentialsKind {
+  const char *option; ///< the option that chooses the kind; null for the identity alone, which needs no choosing
+  bool (*isChosen)(const CredentialsOptions &credentials);
+
+  /// @throws UsageException when the rest of the command line does not suit the kind.
+  void (*check)(const TokenSpec &spec, bool hasIdentity);
+
+  /// Reads what the kind needs, and asks the service.
+  std::shared_ptr<const SamlToken> (*acquire)(const AcquireCall &call);
+};
+
+void AddCredentialsOptions(CLI::App &app, CredentialsOptions &options);
+
+/// @throws UsageException when another option reads the same descriptor.
+void ClaimInput(const CredentialsOptions &options, InputClaims &claims);
+
+/// The kind that the command line chooses; without a choice, the identity when there is one.
+/// @throws UsageException when it chooses none or several.
+const CredentialsKind &ChooseCredentials(const CredentialsOptions &options, bool hasIdentity);
+
+} // namespace SsoClient::Tool

@@ -1,0 +1,38 @@
+// SPDX-License-Identifier: Apache-2.0
+/// @file
+/// The key and certificate that sign a command's requests, and that holder-of-key tokens are bound to.
+
+#pragma once
+
+#include "input_descriptor.h"
+#include "secret_input.h"
+
+#include <ssoclient/holder_of_key_config.h>
+
+#include <boost/optional.hpp>
+
+#include <CLI/CLI.hpp>
+
+#include <string>
+
+namespace SsoClient::Tool {
+
+struct IdentityOptions {
+  std::string certificateFile;
+  std::string key; ///< a file or the URI of a key
+  std::string p12File;
+  SecretOptions passphrase{"passphrase", {}, -1};
+
+  bool IsGiven() const { return !certificateFile.empty() || !p12File.empty(); }
+};
+
+void AddIdentityOptions(CLI::App &app, IdentityOptions &options);
+
+/// @throws UsageException for a passphrase without a key, or when somebody else reads the same descriptor.
+void CheckIdentity(const IdentityOptions &options, InputClaims &claims);
+
+/// The identity, or none. The passphrase is read only if the key needs one.
+/// @throws Tarvel::IOException, Tarvel::Crypto::CryptoException, UsageException (as `ReadSecret` says)
+boost::optional<HolderOfKeyConfig> LoadIdentity(const IdentityOptions &options);
+
+} // namespace SsoClient::Tool

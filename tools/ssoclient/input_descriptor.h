@@ -1,0 +1,41 @@
+// SPDX-License-Identifier: Apache-2.0
+/// @file
+/// Descriptors that the tool reads from, and the rule that one is read for one purpose.
+
+#pragma once
+
+#include <map>
+#include <string>
+
+namespace SsoClient::Tool {
+
+/// A descriptor that is closed at the end, unless it is standard input.
+class InputDescriptor {
+public:
+  /// Opens the file `path`; "-" is standard input. @throws Tarvel::IOException naming the path.
+  explicit InputDescriptor(const std::string &path);
+  /// Takes over `descriptor`.
+  explicit InputDescriptor(int descriptor) noexcept : m_descriptor(descriptor) {}
+  InputDescriptor(const InputDescriptor &) = delete;
+  InputDescriptor &operator=(const InputDescriptor &) = delete;
+  ~InputDescriptor();
+
+  int Get() const noexcept { return m_descriptor; }
+
+private:
+  int m_descriptor;
+};
+
+/// Which option of a command line reads which descriptor that the process was started with.
+class InputClaims {
+public:
+  /// `option` reads the file `path`, which counts when it is "-". @throws UsageException when another one reads it, too.
+  void ClaimFile(const std::string &path, const std::string &option);
+  /// `option` reads `descriptor`, unless that is negative. @throws UsageException when another one reads it, too.
+  void ClaimDescriptor(int descriptor, const std::string &option);
+
+private:
+  std::map<int, std::string> m_options;
+};
+
+} // namespace SsoClient::Tool

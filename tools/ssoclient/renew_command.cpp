@@ -1,0 +1,59 @@
+// SPDX-License-Identifier: Apache-2.0
+/// @file
+/// `ssoclient renew`: asks the service for a new token in place of one that is bound to the caller's key.
+
+#include "command.h"
+#include "connection.h"
+#include "identity.h"
+#include "token_output.h"
+#include "token_spec_options.h"
+#include "trust.h"
+
+#include <memory>
+
+namespace SsoClient::Tool {
+namespace {
+
+struct RenewOptions {
+  ConnectionOptions connection;
+  TrustOptions trust;
+  IdentityOptions identity;
+  std::string lifetime = DEFAULT_LIFETIME;
+  TokenOutputOptions tokenOutput;
+  std::string file;
+};
+
+ExitCode Renew(const RenewOptions &options, const OutputOptions &output) {
+  const std::int64_t lifetimeSec = ParseLifetime(options.lifetime);
+  if (!options.identity.IsGiven()) {
+    throw UsageException("renewing needs the key that the token is bound to; give --cert and --key, or --p12");
+  }
+  InputClaims claims;
+  claims.ClaimFile(options.file, "FILE");
+  CheckIdentity(options.identity, claims);
+  CheckConnection(options.connection);
+  CheckTokenOutput(options.tokenOutput, output);
+
+  const Tarvel::Crypto::CertificateList trusted = LoadTrusted(options.trust, output);
+  const auto given = ReadToken(options.file, trusted, options.trust.toleranceSec);
+  const auto connection = CreateConnection(options.connection, trusted, LoadIdentity(options.identity));
+  const auto token = connection.service->RenewToken(*given, lifetimeSec);
+  RequireWithinTolerance(*token, trusted, options.trust.toleranceSec);
+  WriteToken(*token, options.tokenOutput, output);
+  return ExitCode::DONE;
+}
+
+} // namespace
+
+Action DefineRenew(CLI::App &app, const OutputOptions &output) {
+  const auto options = std::make_shared<RenewOptions>();
+  AddConnectionOptions(app, options->connection);
+  AddIdentityOptions(app, options->identity);
+  AddLifetimeOption(app, options->lifetime);
+  AddTrustOptions(app, options->trust);
+  AddTokenOutputOptions(app, options->tokenOutput);
+  AddTokenArgument(app, options->file);
+  return [options, &output] { return Renew(*options, output); };
+}
+
+} // namespace SsoClient::Tool

@@ -1,0 +1,69 @@
+// SPDX-License-Identifier: Apache-2.0
+
+#include "trust.h"
+
+#include <tarvel/system/date_time.h>
+#include <tarvel/xml/parser.h>
+
+namespace SsoClient::Tool {
+namespace {
+
+void WarnOfDates(const Tarvel::Crypto::CertificateList &trusted) {
+  const Tarvel::System::DateTime now = Tarvel::System::GetUtcDateTime();
+  for (const auto &certificate : trusted) {
+    std::string when;
+    if (now < certificate->GetNotBefore()) {
+      when = "is not valid before " + certificate->GetNotBefore().ToString();
+    } else if (certificate->GetNotAfter() < now) {
+      when = "is not valid after " + certificate->GetNotAfter().ToString();
+    } else {
+      continue;
+    }
+    Warn("the trusted certificate " + certificate->GetSubject() + " " + when + "; its key is trusted all the same");
+  }
+}
+
+} // namespace
+
+void AddTrustOptions(CLI::App &app, TrustOptions &options) {
+  app.add_option("--trust", options.files,
+                 "File with certificates of the service whose keys are trusted, PEM or DER; may be given again")
+      ->required()
+      ->allow_extra_args(false)
+      ->type_name("CERT");
+  app.add_option("--tolerance", options.toleranceSec, "How far this machine's clock may be off, in seconds")
+      ->capture_default_str()
+      ->type_name("S");
+}
+
+void AddTokenArgument(CLI::App &app, std::string &file) {
+  app.add_option("FILE", file, "The token, an XML file; \"-\" is standard input")->required()->type_name("");
+}
+
+Tarvel::Crypto::CertificateList LoadTrusted(const TrustOptions &options, const OutputOptions &output) {
+  Tarvel::Crypto::CertificateList trusted;
+  for (const std::string &file : options.files) {
+    const Tarvel::Crypto::CertificateList some = Tarvel::Crypto::LoadCertificates(file);
+    trusted.insert(trusted.end(), some.begin(), some.end());
+  }
+  if (output.format == Format::TEXT || output.verbose) {
+    WarnOfDates(trusted);
+  }
+  return trusted;
+}
+
+std::shared_ptr<const SamlToken> ReadToken(const std::string &file, const Tarvel::Crypto::CertificateList &trusted,
+                                           std::int64_t toleranceSec) {
+  // One octet more than the parser takes, so that the parser is the one to refuse it.
+  const std::string xml = ReadInput(file, Tarvel::Xml::MAX_DOCUMENT_BYTES + 1);
+  return CreateSamlToken(xml, trusted, toleranceSec);
+}
+
+void RequireWithinTolerance(const SamlToken &token, const Tarvel::Crypto::CertificateList &trusted,
+                            std::int64_t toleranceSec) {
+  if (toleranceSec < DEFAULT_CLOCK_TOLERANCE_SEC) {
+    CreateSamlToken(token.ToXml(), trusted, toleranceSec);
+  }
+}
+
+} // namespace SsoClient::Tool

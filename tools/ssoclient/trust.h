@@ -1,0 +1,46 @@
+// SPDX-License-Identifier: Apache-2.0
+/// @file
+/// Which service's tokens a command accepts, and the tokens that it is given.
+
+#pragma once
+
+#include "output.h"
+
+#include <ssoclient/create_saml_token.h>
+#include <ssoclient/saml_token.h>
+#include <tarvel/crypto/certificate.h>
+
+#include <CLI/CLI.hpp>
+
+#include <cstdint>
+#include <memory>
+#include <string>
+#include <vector>
+
+namespace SsoClient::Tool {
+
+struct TrustOptions {
+  std::vector<std::string> files;
+  std::int64_t toleranceSec = DEFAULT_CLOCK_TOLERANCE_SEC;
+};
+
+void AddTrustOptions(CLI::App &app, TrustOptions &options);
+
+/// Adds the argument FILE, a token.
+void AddTokenArgument(CLI::App &app, std::string &file);
+
+/// The certificates of all trust files; warns of those that are out of date.
+/// @throws Tarvel::IOException, Tarvel::Crypto::CryptoException
+Tarvel::Crypto::CertificateList LoadTrusted(const TrustOptions &options, const OutputOptions &output);
+
+/// The token in `file` ("-" is standard input), verified.
+/// @throws Tarvel::IOException and what `CreateSamlToken` throws.
+std::shared_ptr<const SamlToken> ReadToken(const std::string &file, const Tarvel::Crypto::CertificateList &trusted,
+                                           std::int64_t toleranceSec);
+
+/// Checks a token that the library accepted with `DEFAULT_CLOCK_TOLERANCE_SEC` again, when `toleranceSec` is less.
+/// @throws ParseException
+void RequireWithinTolerance(const SamlToken &token, const Tarvel::Crypto::CertificateList &trusted,
+                            std::int64_t toleranceSec);
+
+} // namespace SsoClient::Tool

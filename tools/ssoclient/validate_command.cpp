@@ -1,0 +1,50 @@
+// SPDX-License-Identifier: Apache-2.0
+/// @file
+/// `ssoclient validate`: asks the service whether it holds a token to be valid.
+
+#include "command.h"
+#include "connection.h"
+#include "trust.h"
+
+#include <memory>
+
+namespace SsoClient::Tool {
+namespace {
+
+struct ValidateOptions {
+  ConnectionOptions connection;
+  TrustOptions trust;
+  std::string file;
+};
+
+std::string RenderVerdict(bool isValid, Format format) {
+  if (format == Format::JSON) {
+    return std::string(R"({"schema":1,"valid":)") + (isValid ? "true" : "false") + "}\n";
+  }
+  return isValid ? "valid\n" : "invalid\n";
+}
+
+ExitCode Validate(const ValidateOptions &options, const OutputOptions &output) {
+  if (output.format == Format::XML) {
+    throw UsageException("a verdict has no form in XML; give --format text or json");
+  }
+  CheckConnection(options.connection);
+
+  const Tarvel::Crypto::CertificateList trusted = LoadTrusted(options.trust, output);
+  const auto token = ReadToken(options.file, trusted, options.trust.toleranceSec);
+  const bool isValid = CreateConnection(options.connection, trusted, boost::none).service->ValidateSubject(*token);
+  WriteOutput(RenderVerdict(isValid, output.format));
+  return isValid ? ExitCode::DONE : ExitCode::TOKEN_INVALID;
+}
+
+} // namespace
+
+Action DefineValidate(CLI::App &app, const OutputOptions &output) {
+  const auto options = std::make_shared<ValidateOptions>();
+  AddConnectionOptions(app, options->connection);
+  AddTrustOptions(app, options->trust);
+  AddTokenArgument(app, options->file);
+  return [options, &output] { return Validate(*options, output); };
+}
+
+} // namespace SsoClient::Tool
