@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 // A thousand asynchronous operations at once over TLS, against a service that stalls before it answers.
-#include "integration/service/canned_service.h"
+#include "integration/service_load/canned_service.h"
 #include "support/process_resources.h"
 #include "support/recorded_log.h"
 #include "support/rendezvous.h"

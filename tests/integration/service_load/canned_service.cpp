@@ -1,5 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
-#include "integration/service/canned_service.h"
+#include "integration/service_load/canned_service.h"
 
 #include "exchange/request.h"
 #include "support/identity.h"

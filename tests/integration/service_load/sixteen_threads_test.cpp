@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 // One service, used from sixteen threads at once over TLS.
-#include "integration/service/canned_service.h"
+#include "integration/service_load/canned_service.h"
 #include "support/process_resources.h"
 
 #include <gtest/gtest.h>
