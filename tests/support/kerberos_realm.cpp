@@ -145,9 +145,9 @@ void KerberosRealm::ChangeKey(const std::string &principal) const {
   Run("kadmin.local", {"change_password", "-randkey", principal});
 }
 
-void KerberosRealm::GetTicket(const std::string &principal, const std::string &keytab, const std::string &cache,
-                              int lifetimeSec) const {
-  Run("kinit", {"-k", "-t", keytab, "-c", cache, "-l", std::to_string(lifetimeSec) + "s", principal}, "any_clock.conf");
+void KerberosRealm::GetTicket(const std::string &principal, const std::string &keytab, const std::string &cache) const {
+  // Asks for more than there is, so that the centre's limit decides.
+  Run("kinit", {"-k", "-t", keytab, "-c", cache, "-l", "1d", principal}, "any_clock.conf");
 }
 
 void KerberosRealm::Stop() noexcept {
@@ -190,6 +190,7 @@ void KerberosRealm::WriteCentreProfile() const {
                                        << "    database_name = " << (m_folder / "principals").string() << "\n"
                                        << "    key_stash_file = " << (m_folder / "stash").string() << "\n"
                                        << "    acl_file = " << (m_folder / "acl").string() << "\n"
+                                       << "    max_life = 1h\n"
                                        << "  }\n"
                                        << "[logging]\n"
                                        << "  kdc = " << log << "\n"

@@ -40,9 +40,8 @@ public:
   /// Gives a principal another key, which no keytab has.
   void ChangeKey(const std::string &principal) const;
 
-  /// Gets a ticket into `cache`, also from a centre whose clock is wrong.
-  void GetTicket(const std::string &principal, const std::string &keytab, const std::string &cache,
-                 int lifetimeSec = 3600) const;
+  /// Gets a ticket into `cache`, also from a centre whose clock is wrong. It is good for an hour by the centre's clock.
+  void GetTicket(const std::string &principal, const std::string &keytab, const std::string &cache) const;
 
   /// Ends the centre, so that nobody answers on its port.
   void Stop() noexcept;

@@ -27,9 +27,7 @@ struct RealmWithAlice {
   explicit RealmWithAlice(const RealmSettings &settings = {}) : realm(settings) {}
 
   /// Logs alice in: her ticket is in the default cache.
-  void LogIn(int lifetimeSec = 3600) const {
-    realm.GetTicket("alice", userKeytab, realm.GetDefaultCache(), lifetimeSec);
-  }
+  void LogIn() const { realm.GetTicket("alice", userKeytab, realm.GetDefaultCache()); }
 
   GssAcceptor MakeAcceptor() const { return GssAcceptor(serviceKeytab, realm.GetFolder()); }
 

@@ -12,6 +12,9 @@
 #include <fstream>
 #include <iterator>
 #include <string>
+#include <vector>
+
+#include <unistd.h>
 
 namespace SsoClient::Gssapi {
 namespace {
@@ -112,6 +115,23 @@ TEST(SpnegoHandler, GetsATicketWithAKeytabAndLeavesTheDefaultCacheAlone) {
   Negotiate(*CreateSpnegoHandler(settings), service);
   EXPECT_EQ(service.GetClient(), "robot@EXAMPLE.TEST");
   EXPECT_EQ(readDefaultCache(), before);
+}
+
+TEST(SpnegoHandler, LeavesTheEnvironmentAlone) {
+  const RealmWithAlice world;
+  const auto readEnvironment = [] {
+    std::vector<std::string> variables;
+    for (char **variable = environ; *variable != nullptr; ++variable) {
+      variables.emplace_back(*variable);
+    }
+    return variables;
+  };
+  const std::vector<std::string> before = readEnvironment();
+  SpnegoSettings settings = SettingsFor();
+  settings.clientKeytab = world.userKeytab;
+  GssAcceptor service = world.MakeAcceptor();
+  Negotiate(*CreateSpnegoHandler(settings), service);
+  EXPECT_EQ(readEnvironment(), before);
 }
 
 TEST(SpnegoHandler, KeepsTheKeytabsTicketInTheCacheThatIsNamed) {
