@@ -122,12 +122,6 @@ void Finish(const Process &process, Result &result) {
   result.exitCode = WIFEXITED(status) ? WEXITSTATUS(status) : 128 + WTERMSIG(status);
 }
 
-std::vector<std::string> CommandLine(const std::vector<std::string> &arguments) {
-  std::vector<std::string> all = {SSOCLIENT_TOOL};
-  all.insert(all.end(), arguments.begin(), arguments.end());
-  return all;
-}
-
 /// Whether process `id` has a handler for `signal`.
 bool Catches(pid_t id, int signal) {
   std::ifstream status("/proc/" + std::to_string(id) + "/status");
@@ -143,20 +137,30 @@ bool Catches(pid_t id, int signal) {
 
 } // namespace
 
+std::vector<std::string> ToolCommand(const std::vector<std::string> &arguments) {
+  std::vector<std::string> all = {SSOCLIENT_TOOL};
+  all.insert(all.end(), arguments.begin(), arguments.end());
+  return all;
+}
+
+std::vector<std::string> ShellCommand(const std::string &commandLine) {
+  const std::string toolFolder = std::filesystem::path(SSOCLIENT_TOOL).parent_path();
+  return {"/bin/sh", "-c", "PATH='" + toolFolder + "':\"$PATH\"; " + commandLine};
+}
+
 Result RunTool(const std::vector<std::string> &arguments, const std::string &input) {
   Process process;
   Result result;
-  Start(process, CommandLine(arguments), TEST_DATA_DIR "/tokens");
+  Start(process, ToolCommand(arguments), TEST_DATA_DIR "/tokens");
   Exchange(process, input, result);
   Finish(process, result);
   return result;
 }
 
 Result RunShell(const std::string &commandLine, const std::string &folder) {
-  const std::string toolFolder = std::filesystem::path(SSOCLIENT_TOOL).parent_path();
   Process process;
   Result result;
-  Start(process, {"/bin/sh", "-c", "PATH='" + toolFolder + "':\"$PATH\"; " + commandLine}, folder);
+  Start(process, ShellCommand(commandLine), folder);
   Exchange(process, {}, result);
   Finish(process, result);
   return result;
@@ -165,7 +169,7 @@ Result RunShell(const std::string &commandLine, const std::string &folder) {
 Result RunToolAndSignal(const std::vector<std::string> &arguments, int signal) {
   Process process;
   Result result;
-  Start(process, CommandLine(arguments), TEST_DATA_DIR "/tokens");
+  Start(process, ToolCommand(arguments), TEST_DATA_DIR "/tokens");
   // No event tells from outside that a process has come to catch a signal, so its state is asked for.
   while (!Catches(process.id, signal)) {
     if (waitpid(process.id, nullptr, WNOHANG) != 0) {

@@ -15,10 +15,16 @@ struct Result {
   std::string err;
 };
 
+/// The words that start the tool with `arguments`.
+std::vector<std::string> ToolCommand(const std::vector<std::string> &arguments);
+
+/// The words that have a shell run `commandLine` with "ssoclient" in the search path.
+std::vector<std::string> ShellCommand(const std::string &commandLine);
+
 /// Runs the tool with `arguments`, in tests/data/tokens, with `input` as its standard input, to its end.
 Result RunTool(const std::vector<std::string> &arguments, const std::string &input = {});
 
-/// Runs `commandLine` by the shell, in `folder`, with "ssoclient" in the search path.
+/// Runs `commandLine` by the shell, in `folder`, as `ShellCommand` says.
 Result RunShell(const std::string &commandLine, const std::string &folder = TEST_DATA_DIR "/tokens");
 
 /// Starts the tool with a standard input that stays open and silent, sends it `signal` once it catches that signal, and

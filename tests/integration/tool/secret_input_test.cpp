@@ -30,7 +30,7 @@ protected:
   std::vector<std::string> Acquire(const std::vector<std::string> &more) const {
     std::vector<std::string> all = m_acquire;
     all.insert(all.end(), more.begin(), more.end());
-    return all;
+    return ToolCommand(all);
   }
 
   /// A command line that a shell runs in the folder with the keys.

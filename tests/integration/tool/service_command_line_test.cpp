@@ -168,19 +168,19 @@ TEST_P(ServiceRefusal, IsOneJsonObjectAndTheSameExitCode) {
 INSTANTIATE_TEST_SUITE_P(Of, ServiceRefusal, testing::ValuesIn(REFUSALS),
                          [](const auto &refusal) { return std::string(refusal.param.name); });
 
-TEST(Acquire, DoesNotMixTheTokenAndJsonOnStandardOutput) {
+TEST(ServiceCommandLine, DoesNotMixTheTokenAndJsonOnStandardOutput) {
   ExpectResult(RunShell("ssoclient acquire " STS "--user alice --out - --format json"), 2, "",
                R"({"schema":1,"error":{"class":"UsageException","message":)"
                R"("--out - and --format json cannot share standard output"}})"
                "\n");
 }
 
-TEST(Acquire, ShowsNoSecretThatWasPutOnTheCommandLine) {
+TEST(ServiceCommandLine, ShowsNoSecretThatWasPutOnTheCommandLine) {
   ExpectResult(RunShell("ssoclient acquire " STS "--user alice --password=wonderland"), 2, "",
                "ssoclient: usage: not expected: --password; see ssoclient --help\n");
 }
 
-TEST(Validate, HasNoVerdictInXml) {
+TEST(ServiceCommandLine, AsksForNoVerdictInXml) {
   ExpectResult(RunShell("ssoclient validate " STS "--format xml bearer.xml"), 2, "",
                "ssoclient: usage: a verdict has no form in XML; give --format text or json\n");
 }

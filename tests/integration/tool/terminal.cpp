@@ -21,12 +21,10 @@ constexpr int TURN_MS = 10;
 
 } // namespace
 
-TerminalSession::TerminalSession(const std::vector<std::string> &arguments, const std::string &folder) {
-  std::vector<std::string> all = {SSOCLIENT_TOOL};
-  all.insert(all.end(), arguments.begin(), arguments.end());
+TerminalSession::TerminalSession(std::vector<std::string> words, const std::string &folder) {
   std::vector<char *> raw;
-  for (std::string &argument : all) {
-    raw.push_back(argument.data());
+  for (std::string &word : words) {
+    raw.push_back(word.data());
   }
   raw.push_back(nullptr);
   if (openpty(&m_master, &m_slave, nullptr, nullptr, nullptr) != 0) {
@@ -105,7 +103,7 @@ int TerminalSession::Finish() {
   // The terminal stays open at our end, so the end of the process is asked for, between looks at what it shows.
   for (int waited = 0; waitpid(m_process, &status, WNOHANG) == 0; waited += TURN_MS) {
     if (waited > PATIENCE_MS) {
-      throw std::runtime_error("the tool does not end; the terminal shows '" + m_shown + "'");
+      throw std::runtime_error("the process does not end; the terminal shows '" + m_shown + "'");
     }
     ReadSome(TURN_MS);
   }

@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// Running the tool at a terminal of its own.
+/// Running a command at a terminal of its own.
 
 #pragma once
 
@@ -11,12 +11,12 @@
 
 namespace ToolTest {
 
-/// The tool at a new pseudo-terminal, which is its standard input, output and error, and its controlling terminal. What
+/// A command at a new pseudo-terminal, which is its standard input, output and error, and its controlling terminal. What
 /// waits gives up after half a minute by an exception.
 class TerminalSession {
 public:
-  /// Starts the tool with `arguments` in `folder`.
-  TerminalSession(const std::vector<std::string> &arguments, const std::string &folder);
+  /// Starts the program `words[0]` in `folder`.
+  TerminalSession(std::vector<std::string> words, const std::string &folder);
   TerminalSession(const TerminalSession &) = delete;
   TerminalSession &operator=(const TerminalSession &) = delete;
   ~TerminalSession();
@@ -30,7 +30,7 @@ public:
   bool IsStopped() const;
 
   void Signal(int signal);
-  /// The exit code, or 128 plus the signal that ended the tool; reads what is still shown.
+  /// The exit code, or 128 plus the signal that ended the process; reads what is still shown.
   int Finish();
 
   /// All that the terminal has shown so far, its line ends as CR LF.
@@ -40,7 +40,7 @@ private:
   bool ReadSome(int timeoutMs);
 
   int m_master = -1;
-  int m_slave = -1; ///< kept open, so that the settings can be asked for after the tool has ended
+  int m_slave = -1; ///< kept open, so that the settings can be asked for after the process has ended
   pid_t m_process = -1;
   std::string m_shown;
 };

@@ -1,0 +1,136 @@
+// SPDX-License-Identifier: Apache-2.0
+// The file that a token is written to: whole or not at all, for its owner alone.
+
+#include "expect_result.h"
+#include "service_test.h"
+#include "terminal.h"
+
+#include <gtest/gtest.h>
+
+#include <csignal>
+#include <filesystem>
+#include <set>
+#include <string>
+
+#include <sys/stat.h>
+
+namespace ToolTest {
+namespace {
+
+class TokenFile : public ServiceTest {
+protected:
+  TokenFile() { m_before = m_folder.Names(); }
+
+  std::string Line(const std::string &fault = {}) const {
+    return "ssoclient acquire " + Service(fault) + PASSWORD + "--format xml --out token.xml ";
+  }
+
+  unsigned Mode(const std::string &name) const {
+    struct stat status = {};
+    stat((m_folder / name).c_str(), &status);
+    return status.st_mode & 07777u;
+  }
+
+  bool IsToken(const std::string &name) const { return Run("ssoclient verify --trust sts.pem " + name).exitCode == 0; }
+
+  std::set<std::string> WithToken() const {
+    std::set<std::string> names = m_before;
+    names.insert("token.xml");
+    return names;
+  }
+
+  std::set<std::string> m_before;
+};
+
+TEST_F(TokenFile, IsReadableForItsOwnerAloneWhateverTheMask) {
+  EXPECT_EQ(0, Run("umask 000; " + Line()).exitCode);
+  EXPECT_EQ(0600u, Mode("token.xml"));
+  EXPECT_TRUE(IsToken("token.xml"));
+  EXPECT_EQ(WithToken(), m_folder.Names());
+}
+
+TEST_F(TokenFile, IsNotReplacedWithoutForce) {
+  m_folder.Write("token.xml", "what was there");
+  ExpectResult(Run(Line()), 7, "", "ssoclient: file: token.xml: is there already; --force replaces it\n");
+  EXPECT_EQ("what was there", m_folder.Read("token.xml"));
+  EXPECT_EQ("", m_service.GetLog()); // nothing was asked of the service
+}
+
+TEST_F(TokenFile, IsReplacedByForceAndThenForItsOwnerAlone) {
+  m_folder.Write("token.xml", std::string(1 << 20, 'x'));
+  EXPECT_EQ(0, Run(Line() + "--force").exitCode);
+  EXPECT_EQ(0600u, Mode("token.xml"));
+  EXPECT_TRUE(IsToken("token.xml"));
+  EXPECT_EQ(WithToken(), m_folder.Names());
+}
+
+TEST_F(TokenFile, ThatComesMeanwhileIsNotReplacedWithoutForce) {
+  TerminalSession session(ShellCommand("exec " + Line("stall-then-answer-1")), m_folder.Path());
+  AwaitLog("/sts/fault/stall-then-answer-1: issued");
+  m_folder.Write("token.xml", "what came meanwhile");
+  EXPECT_EQ(7, session.Finish());
+  EXPECT_EQ("ssoclient: file: token.xml: is there already; --force replaces it\r\n", session.Shown());
+  EXPECT_EQ("what came meanwhile", m_folder.Read("token.xml"));
+  EXPECT_EQ(WithToken(), m_folder.Names());
+}
+
+TEST_F(TokenFile, IsNotThereWhenItCannotBeWrittenWhole) {
+  ExpectResult(Run("ulimit -f 1; " + Line()), 7, "", "ssoclient: file: token.xml: File too large\n");
+  EXPECT_EQ(m_before, m_folder.Names());
+}
+
+TEST_F(TokenFile, StaysAsItWasWhenItCannotBeReplacedWhole) {
+  m_folder.Write("token.xml", "what was there");
+  EXPECT_EQ(7, Run("ulimit -f 1; " + Line() + "--force").exitCode);
+  EXPECT_EQ("what was there", m_folder.Read("token.xml"));
+  EXPECT_EQ(WithToken(), m_folder.Names());
+}
+
+TEST_F(TokenFile, IsWrittenWholeWhenTheToolIsToldToEndMeanwhile) {
+  for (const int signal : {SIGINT, SIGTERM, SIGHUP}) {
+    const Result result =
+        Run("SIGNAL_AT_FSYNC=" + std::to_string(signal) +
+            " ASAN_OPTIONS=verify_asan_link_order=0 LD_PRELOAD=" INTERRUPTING_FSYNC " exec " + Line() + "--force");
+    EXPECT_EQ(128 + signal, result.exitCode) << result.err;
+    EXPECT_EQ(WithToken(), m_folder.Names());
+    EXPECT_TRUE(IsToken("token.xml"));
+    std::filesystem::remove(m_folder / "token.xml");
+  }
+}
+
+TEST_F(TokenFile, IsNotThereWhenTheToolIsInterruptedWhileItWaitsForTheService) {
+  TerminalSession session(ShellCommand("exec " + Line("stall")), m_folder.Path());
+  AwaitLog("/sts/fault/stall: fault");
+  session.Type("\x03"); // Ctrl-C
+  EXPECT_EQ(130, session.Finish());
+  EXPECT_EQ(m_before, m_folder.Names());
+}
+
+TEST_F(TokenFile, IsNotThereWhenTheToolIsTerminatedWhileItWaitsForTheService) {
+  TerminalSession session(ShellCommand("exec " + Line("stall")), m_folder.Path());
+  AwaitLog("/sts/fault/stall: fault");
+  session.Signal(SIGTERM);
+  EXPECT_EQ(128 + SIGTERM, session.Finish());
+  EXPECT_EQ(m_before, m_folder.Names());
+}
+
+TEST_F(TokenFile, IsRefusedInPlaceOfALinkADeviceOrAFolder) {
+  std::filesystem::create_symlink("elsewhere.xml", m_folder / "link.xml");
+  std::filesystem::create_directory(m_folder / "folder");
+  for (const char *file : {"link.xml", "folder", "/dev/null"}) {
+    ExpectResult(Run("ssoclient acquire " + Service() + PASSWORD + "--force --out " + file), 7, "",
+                 std::string("ssoclient: file: ") + file + ": is no regular file\n");
+  }
+  EXPECT_EQ("", m_service.GetLog());
+}
+
+TEST_F(TokenFile, MayStandInAnotherFolder) {
+  std::filesystem::create_directory(m_folder / "folder");
+  EXPECT_EQ(0, Run("ssoclient acquire " + Service() + PASSWORD + "--out folder/token.xml").exitCode);
+  EXPECT_EQ(0, Run("ssoclient acquire " + Service() + PASSWORD + "--out " + m_folder / "folder/other.xml").exitCode);
+  EXPECT_TRUE(IsToken("folder/token.xml"));
+  EXPECT_TRUE(IsToken("folder/other.xml"));
+}
+
+} // namespace
+} // namespace ToolTest
