@@ -11,6 +11,7 @@ namespace {
 constexpr int DRIP_SECONDS = 2;
 constexpr int BAD_STATUS = 503;
 constexpr int LONGEST_DELAY = 3600;
+constexpr int DEEP_LEVELS = 1000;
 
 struct NamedFault {
   std::string_view name;
@@ -62,6 +63,12 @@ constexpr NamedFault NAMED[] = {
     {"unsigned-token", OfToken(TokenFault::UNSIGNED)},
     {"wrong-audience", OfToken(TokenFault::WRONG_AUDIENCE)},
     {"bearer-for-hok", OfToken(TokenFault::BEARER)},
+    {"no-subject", OfToken(TokenFault::NO_SUBJECT)},
+    {"unknown-element", OfToken(TokenFault::UNKNOWN_ELEMENT)},
+    {"wrong-version", OfToken(TokenFault::WRONG_VERSION)},
+    {"doctype", OfDocument(DocumentFault::DOCTYPE)},
+    {"too-deep", OfDocument(DocumentFault::TOO_DEEP)},
+    {"soap-fault-without-text", OfDocument(DocumentFault::SOAP_FAULT_WITHOUT_TEXT)},
     {"soap-fault-without-code", OfDocument(DocumentFault::SOAP_FAULT_WITHOUT_CODE)},
 };
 
@@ -165,6 +172,14 @@ void SwapWrapper(xmlNode &body) {
   xmlAddChild(&collection, &content);
 }
 
+/// An element in an element in an element and so on.
+void Deepen(xmlNode &body) {
+  xmlNode *innermost = &body;
+  for (int level = 0; level < DEEP_LEVELS; ++level) {
+    innermost = &AddElement(*innermost, Ns::WST, "Deeper");
+  }
+}
+
 /// What stands in the body becomes the document.
 void RemoveEnvelope(xmlDoc &response, xmlNode &body) {
   xmlNode *const content = ChildElements(body).front();
@@ -239,6 +254,26 @@ void SpoilFacts(TokenFacts &facts, TokenFault fault) {
   }
 }
 
+void SpoilToken(xmlDoc &token, TokenFault fault) {
+  xmlNode &assertion = *xmlDocGetRootElement(&token);
+  switch (fault) {
+  case TokenFault::NO_SUBJECT: {
+    xmlNode &subject = RequireChild(assertion, Ns::SAML, "Subject");
+    xmlUnlinkNode(&subject);
+    xmlFreeNode(&subject);
+    return;
+  }
+  case TokenFault::UNKNOWN_ELEMENT:
+    AddElement(assertion, Ns::SAML, "Surprise");
+    return;
+  case TokenFault::WRONG_VERSION:
+    xmlSetProp(&assertion, XmlText("Version"), XmlText("1.1"));
+    return;
+  default:
+    return;
+  }
+}
+
 void TamperWith(xmlDoc &token) {
   xmlNode &subject = RequireChild(*xmlDocGetRootElement(&token), Ns::SAML, "Subject");
   SetText(RequireChild(subject, Ns::SAML, "NameID"), "mallory@corp.example");
@@ -268,12 +303,17 @@ std::string SpoilResponse(xmlDoc &response, DocumentFault fault) {
     break;
   case DocumentFault::GARBLED_XML: {
     const std::string text = Serialise(response);
-    return text.substr(0, text.size() / 2) + "</garbled>";
+    return text.substr(0, text.rfind("</")) + "</garbled>";
   }
   case DocumentFault::NOT_SOAP:
     return "<html><head><title>Welcome</title></head><body>It works!</body></html>";
   case DocumentFault::EMPTY_BODY:
     return {};
+  case DocumentFault::DOCTYPE:
+    return "<!DOCTYPE Envelope>" + Serialise(response);
+  case DocumentFault::TOO_DEEP:
+    Deepen(RequireChild(*root, Ns::SOAPENV, "Body"));
+    break;
   default:
     break;
   }

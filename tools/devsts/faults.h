@@ -15,7 +15,19 @@
 namespace DevSts {
 
 /// What is wrong with the token.
-enum class TokenFault { NONE, EXPIRED, EARLY, TAMPERED, WRONG_SIGNER, UNSIGNED, WRONG_AUDIENCE, BEARER };
+enum class TokenFault {
+  NONE,
+  EXPIRED,
+  EARLY,
+  TAMPERED,
+  WRONG_SIGNER,
+  UNSIGNED,
+  WRONG_AUDIENCE,
+  BEARER,
+  NO_SUBJECT,
+  UNKNOWN_ELEMENT,
+  WRONG_VERSION,
+};
 
 /// What is wrong with the document that is answered.
 enum class DocumentFault {
@@ -30,6 +42,9 @@ enum class DocumentFault {
   EMPTY_BODY,
   SOAP_FAULT,
   SOAP_FAULT_WITHOUT_CODE,
+  SOAP_FAULT_WITHOUT_TEXT,
+  DOCTYPE,
+  TOO_DEEP,
 };
 
 /// What is wrong on the wire.
@@ -65,6 +80,9 @@ std::string FaultHelp();
 
 /// Makes the facts wrong as the fault wants it, before the token is built.
 void SpoilFacts(TokenFacts &facts, TokenFault fault);
+
+/// Makes the token wrong as the fault wants it, before it is signed.
+void SpoilToken(xmlDoc &token, TokenFault fault);
 
 /// Changes the subject of a token that is signed already.
 void TamperWith(xmlDoc &token);

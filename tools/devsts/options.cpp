@@ -13,6 +13,7 @@ constexpr int LONGEST_TOLERANCE = 24 * 3600;
 std::string Footer() {
   return "Faults:\n" + FaultHelp() +
          "\nA request to URL/fault/NAME meets that fault alone, whatever --fault says.\n"
+         "Behind URL/fault/NAME/once/TEXT only the first request meets it.\n"
          "\nExamples:\n"
          "  ssoclient-devsts --state ~/.cache/devsts\n"
          "      Serves alice@corp.example (password wonderland) and bob@corp.example (password builder) on a free\n"

@@ -14,6 +14,7 @@ namespace {
 
 constexpr std::string_view PATH = "/sts";
 constexpr std::string_view FAULT_PATH = "/sts/fault/";
+constexpr std::string_view ONCE = "/once/"; // behind a fault's name, before a text that tells whose "once" it is
 constexpr std::string_view MEDIA_TYPE = "text/xml";
 
 std::string Lower(std::string_view text) {
@@ -61,7 +62,7 @@ void LogLine(const std::string &line) noexcept {
 Delivery RequestHandler::Answer(const HttpRequest &request) const {
   Fault fault = m_fault;
   if (request.target.rfind(FAULT_PATH, 0) == 0) {
-    const std::optional<Fault> named = ParseFault(std::string_view(request.target).substr(FAULT_PATH.size()));
+    const std::optional<Fault> named = FaultOf(std::string_view(request.target).substr(FAULT_PATH.size()));
     if (!named) {
       return Plain(404, "No fault of that name.\n", request.keepOpen);
     }
@@ -85,6 +86,20 @@ Delivery RequestHandler::Answer(const HttpRequest &request) const {
   http.status = answer.status;
   http.body = answer.body;
   return Deliver(http, fault, request.keepOpen);
+}
+
+std::optional<Fault> RequestHandler::FaultOf(std::string_view path) const {
+  const std::size_t once = path.find(ONCE);
+  std::optional<Fault> fault = ParseFault(path.substr(0, once));
+  if (fault && once != std::string_view::npos && !IsFirst(path)) {
+    fault = Fault();
+  }
+  return fault;
+}
+
+bool RequestHandler::IsFirst(std::string_view onceOnly) const {
+  const std::lock_guard<std::mutex> lock(m_mutex);
+  return m_met.insert(std::string(onceOnly)).second;
 }
 
 Delivery RequestHandler::Handle(const HttpRequest &request) const noexcept {

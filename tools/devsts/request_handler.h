@@ -7,7 +7,12 @@
 #include "delivery.h"
 #include "token_service.h"
 
+#include <functional>
+#include <mutex>
+#include <optional>
+#include <set>
 #include <string>
+#include <string_view>
 
 namespace DevSts {
 
@@ -31,9 +36,15 @@ public:
 
 private:
   Delivery Answer(const HttpRequest &request) const;
+  /// The fault that a path below /sts/fault/ names; nothing when there is none of that name.
+  std::optional<Fault> FaultOf(std::string_view path) const;
+  /// Whether this is the first time that the text is met.
+  bool IsFirst(std::string_view onceOnly) const;
 
   const TokenService &m_service;
   const Fault m_fault;
+  mutable std::mutex m_mutex;
+  mutable std::set<std::string, std::less<>> m_met; ///< guarded by the mutex
 };
 
 /// Writes one line to standard error, with a time, and with what could steer a terminal made visible.

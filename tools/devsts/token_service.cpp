@@ -85,6 +85,9 @@ SoapAnswer TokenService::Answer(std::string_view action, std::string_view messag
     if (fault.document == DocumentFault::SOAP_FAULT_WITHOUT_CODE) {
       return {500, Serialise(*FaultResponse(nullptr, "a fault was asked for")), "fault without code"};
     }
+    if (fault.document == DocumentFault::SOAP_FAULT_WITHOUT_TEXT) {
+      throw Refusal(Code::FAILED_AUTHENTICATION, "");
+    }
     answer.body = SpoilResponse(*response, fault.document);
   } catch (const Refusal &refusal) {
     const FaultCode &code = refusal.GetCode();
@@ -209,6 +212,7 @@ TokenFacts TokenService::FactsOfCertificate(X509 &certificate) const {
 Document TokenService::MakeToken(TokenFacts facts, TokenFault fault) const {
   SpoilFacts(facts, fault);
   Document token = BuildToken(facts);
+  SpoilToken(*token, fault);
   if (fault != TokenFault::UNSIGNED) {
     SignToken(*token, fault == TokenFault::WRONG_SIGNER ? m_foreignSigner : m_signer);
   }
