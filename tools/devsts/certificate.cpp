@@ -101,6 +101,10 @@ bool HasStrongKey(const X509 &certificate) {
 }
 
 bool IsClientOf(X509 &certificate, X509 &authority) {
+  // Without the extension OpenSSL takes a certificate for any purpose, and so the token signer's for a client's.
+  if ((X509_get_extension_flags(&certificate) & EXFLAG_XKUSAGE) == 0) {
+    return false;
+  }
   const std::unique_ptr<X509_STORE, StoreDeleter> store(X509_STORE_new());
   const std::unique_ptr<X509_STORE_CTX, StoreContextDeleter> context(X509_STORE_CTX_new());
   const bool trusted = store && context && X509_STORE_add_cert(store.get(), &authority) == 1 &&

@@ -34,7 +34,7 @@ std::string ThumbprintOf(const X509 &certificate);
 /// Whether the key is RSA of at least 2048 bits.
 bool HasStrongKey(const X509 &certificate);
 
-/// Whether `authority` issued the certificate for clients, and its dates hold now.
+/// Whether `authority` issued the certificate, for clients by its extended key usage, and its dates hold now.
 bool IsClientOf(X509 &certificate, X509 &authority);
 
 /// "CN@O" of the subject; empty unless it has exactly one of each.

@@ -1,7 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "message_check.h"
 
-#include "refusal.h"
 #include "token_reader.h"
 
 #include <algorithm>
@@ -214,7 +213,8 @@ CheckedMessage CheckMessage(std::string_view xml, const MessagePolicy &policy) {
     message.credentials = ReadCredentials(*security.usernameToken);
   }
   if (security.assertion) {
-    message.presentedToken = ReadIssuedToken(*security.assertion, message.identifiers, *policy.tokenSigner);
+    message.presentedToken =
+        ReadIssuedToken(*security.assertion, message.identifiers, *policy.tokenSigner, Code::INVALID_TOKEN);
     RequireCurrent(*message.presentedToken, policy.tolerance, Code::INVALID_TOKEN);
   }
   if (security.signature) {

@@ -5,6 +5,7 @@
 #pragma once
 
 #include "certificate.h"
+#include "refusal.h"
 #include "signature_engine.h"
 #include "token_facts.h"
 #include "xml_tree.h"
@@ -18,7 +19,7 @@ namespace DevSts {
 
 struct PasswordCredentials {
   std::string name;
-  std::string password; // NOLINT: a development service's, named in its own documentation
+  std::string password;
 };
 
 /// A message that has been checked. Nodes belong to `document`.
@@ -43,6 +44,6 @@ struct MessagePolicy {
 CheckedMessage CheckMessage(std::string_view xml, const MessagePolicy &policy);
 
 /// @throws Refusal (`code`) unless the token is valid now
-void RequireCurrent(const TokenFacts &token, std::chrono::seconds tolerance, const struct FaultCode &code);
+void RequireCurrent(const TokenFacts &token, std::chrono::seconds tolerance, const FaultCode &code);
 
 } // namespace DevSts

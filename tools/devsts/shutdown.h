@@ -6,8 +6,8 @@
 
 namespace DevSts {
 
-/// SIGTERM and SIGINT, caught as long as this lives. Made before any thread starts, so that all of them leave the signals
-/// to it.
+/// Catches SIGTERM and SIGINT, for the rest of the process. Made before any thread starts, so that all of them leave the
+/// signals to it.
 class EndSignals {
 public:
   EndSignals();

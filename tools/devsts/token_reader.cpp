@@ -1,8 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "token_reader.h"
 
-#include "refusal.h"
-
 #include <charconv>
 
 namespace DevSts {
@@ -10,7 +8,7 @@ namespace DevSts {
 namespace {
 
 [[noreturn]] void RefuseToken(const std::string &reason) {
-  throw Refusal(Code::INVALID_TOKEN, reason);
+  throw Refusal(Code::INVALID_TOKEN, reason); // the code is the caller's in the end
 }
 
 std::string RequireAttribute(const xmlNode &element, const char *name) {
@@ -113,14 +111,7 @@ void ReadAttribute(const xmlNode &attribute, TokenFacts &facts) {
   }
 }
 
-} // namespace
-
-TokenFacts ReadIssuedToken(const xmlNode &assertion, const Identifiers &identifiers, const SignatureKey &signer) {
-  if (!IsElement(assertion, Ns::SAML, "Assertion")) {
-    RefuseToken("not a SAML 2.0 assertion");
-  }
-  VerifySignature(assertion, identifiers, signer);
-
+TokenFacts ReadFacts(const xmlNode &assertion) {
   TokenFacts facts;
   ReadSubject(RequireChild(assertion, Ns::SAML, "Subject"), facts);
   const xmlNode &conditions = RequireChild(assertion, Ns::SAML, "Conditions");
@@ -142,6 +133,18 @@ TokenFacts ReadIssuedToken(const xmlNode &assertion, const Identifiers &identifi
     }
   }
   return facts;
+}
+
+} // namespace
+
+TokenFacts ReadIssuedToken(const xmlNode &assertion, const Identifiers &identifiers, const SignatureKey &signer,
+                           const FaultCode &code) {
+  try {
+    VerifySignature(assertion, identifiers, signer);
+    return ReadFacts(assertion);
+  } catch (const Refusal &refusal) {
+    throw Refusal(code, refusal.what());
+  }
 }
 
 } // namespace DevSts

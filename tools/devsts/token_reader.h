@@ -4,6 +4,7 @@
 
 #pragma once
 
+#include "refusal.h"
 #include "signature_engine.h"
 #include "token_facts.h"
 #include "xml_tree.h"
@@ -12,7 +13,8 @@ namespace DevSts {
 
 /// The facts of the assertion, once its signature by `signer` over the whole of it is verified. Its dates are not judged.
 /// `identifiers` are those of the assertion's document.
-/// @throws Refusal when it is not one of ours, whole and unchanged; the code is for the caller to choose anew
-TokenFacts ReadIssuedToken(const xmlNode &assertion, const Identifiers &identifiers, const SignatureKey &signer);
+/// @throws Refusal (`code`) when it is not one of ours, whole and unchanged
+TokenFacts ReadIssuedToken(const xmlNode &assertion, const Identifiers &identifiers, const SignatureKey &signer,
+                           const FaultCode &code);
 
 } // namespace DevSts

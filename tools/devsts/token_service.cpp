@@ -56,8 +56,8 @@ void ApplyDelegation(TokenFacts &facts, const TrustRequest &request, const Check
   facts.delegations = request.delegable ? allowed : 0;
 }
 
-void RequireAction(std::string_view action, const char *message, const TrustRequest &request) {
-  const std::string expected = std::string(Ns::WST.uri) + message + RequestTypeName(request.type);
+void RequireAction(std::string_view action, const TrustRequest &request) {
+  const std::string expected = std::string(Ns::WST.uri) + "/RST/" + RequestTypeName(request.type);
   if (action != expected) {
     throw Refusal(Code::INVALID_REQUEST, "the SOAPAction does not fit the message");
   }
@@ -102,7 +102,7 @@ Document TokenService::Process(std::string_view action, std::string_view message
                                std::string &log) const {
   const CheckedMessage checked = CheckMessage(message, m_policy);
   const TrustRequest request = ReadTrustRequest(*checked.request);
-  RequireAction(action, "/RST/", request);
+  RequireAction(action, request);
   switch (request.type) {
   case RequestType::RENEW:
     return Renew(checked, request, fault, log);
@@ -133,12 +133,7 @@ Document TokenService::Renew(const CheckedMessage &message, const TrustRequest &
   if (!message.signer) {
     throw Refusal(Code::INVALID_SECURITY, "a renewal must be signed");
   }
-  TokenFacts facts;
-  try {
-    facts = ReadIssuedToken(*request.target, message.identifiers, m_verifier);
-  } catch (const Refusal &refusal) {
-    throw Refusal(Code::INVALID_TARGET, refusal.what());
-  }
+  TokenFacts facts = ReadIssuedToken(*request.target, message.identifiers, m_verifier, Code::INVALID_TARGET);
   if (facts.certificate != EncodeCertificate(*message.signer)) {
     throw Refusal(Code::FAILED_AUTHENTICATION, "the renewal is not signed by the holder of the token's key");
   }
@@ -155,8 +150,8 @@ Document TokenService::Renew(const CheckedMessage &message, const TrustRequest &
 
 Document TokenService::Validate(const CheckedMessage &message, const TrustRequest &request, std::string &log) const {
   try {
-    RequireCurrent(ReadIssuedToken(*request.target, message.identifiers, m_verifier), m_policy.tolerance,
-                   Code::INVALID_TARGET);
+    const FaultCode &code = Code::INVALID_TARGET;
+    RequireCurrent(ReadIssuedToken(*request.target, message.identifiers, m_verifier, code), m_policy.tolerance, code);
     log = "valid";
     return ValidateResponse(true);
   } catch (const Refusal &refusal) {

@@ -62,12 +62,11 @@ std::string ValueOf(const xmlAttr &attribute) {
 
 void RegisterIdentifier(xmlNode &element, xmlAttr &attribute, Identifiers &identifiers) {
   const std::string value = ValueOf(attribute);
-  if (!identifiers.emplace(value, &element).second) {
+  // libxml2 knows xml:id by itself, and so may know the identifier already.
+  const bool isKnown = attribute.atype == XML_ATTRIBUTE_ID;
+  if (!identifiers.emplace(value, &element).second ||
+      (!isKnown && !xmlAddID(nullptr, element.doc, XmlText(value.c_str()), &attribute))) {
     throw Refusal(Code::INVALID_SECURITY, "the identifier '" + value + "' stands twice");
-  }
-  // libxml2 knows xml:id by itself.
-  if (attribute.atype != XML_ATTRIBUTE_ID && !xmlAddID(nullptr, element.doc, XmlText(value.c_str()), &attribute)) {
-    throw Refusal(Code::INVALID_SECURITY, "the identifier '" + value + "' cannot be used");
   }
 }
 

@@ -1,0 +1,67 @@
+// SPDX-License-Identifier: Apache-2.0
+/// @file
+/// Messages to the development service: built by the library's own request builder, then spoilt as text.
+
+#pragma once
+
+#include "exchange/request.h"
+#include "exchange/request_builder_impl.h"
+#include "support/dev_sts.h"
+#include "support/token_stand_in.h"
+#include "tls_client.h"
+
+#include <ssoclient/token_spec.h>
+#include <tarvel/system/environment.h>
+
+#include <gtest/gtest.h>
+
+#include <chrono>
+#include <string>
+#include <string_view>
+
+namespace DevStsTest {
+
+/// The identity in the service's state folder of that name, as "client".
+SsoClient::HolderOfKeyConfig IdentityOf(const Testing::DevSts &service, const std::string &name);
+
+/// A builder that signs with that identity; one that does not sign for an empty name.
+SsoClient::RequestBuilderImpl BuilderFor(const Testing::DevSts &service, const std::string &name);
+
+/// A lifetime of an hour, and nothing else.
+SsoClient::TokenSpec PlainSpec();
+/// The same for a token that may be renewed and delegated.
+SsoClient::TokenSpec RenewableSpec();
+
+SsoClient::Request PasswordRequest(const std::string &user = "alice@corp.example",
+                                   const std::string &password = "wonderland");
+SsoClient::Request CertificateRequest(const Testing::DevSts &service, const SsoClient::TokenSpec &spec = PlainSpec(),
+                                      const std::string &identity = "client");
+
+/// `text` with the first `from` replaced. @throws std::runtime_error when there is none: a test that spoils nothing
+std::string Replaced(std::string text, std::string_view from, std::string_view to);
+/// `text` without what stands from the first `begin` to the next `end`, both included.
+std::string Without(const std::string &text, std::string_view begin, std::string_view end);
+/// What stands between the first `begin` and the next `end`. @throws std::runtime_error when it is not there
+std::string Between(const std::string &text, std::string_view begin, std::string_view end);
+
+HttpAnswer Send(const Testing::DevSts &service, const SsoClient::Request &request, std::string_view target = "/sts");
+
+/// The assertion in an answer, as something that the builder takes. @throws std::runtime_error when there is none
+Testing::TokenStandIn TokenIn(const HttpAnswer &answer);
+
+/// While it lives, the library's clock is that much ahead of the true time.
+class ShiftedClock {
+public:
+  explicit ShiftedClock(std::chrono::seconds ahead);
+
+private:
+  Tarvel::System::ScopedEnvironment m_scope;
+};
+
+/// The answer is a SOAP fault, by HTTP status 500, of exactly this code and text.
+testing::AssertionResult IsRefused(const HttpAnswer &answer, const std::string &code, const std::string &reason);
+
+/// The answer holds a token.
+testing::AssertionResult IsIssued(const HttpAnswer &answer);
+
+} // namespace DevStsTest

@@ -1,0 +1,59 @@
+// SPDX-License-Identifier: Apache-2.0
+/// @file
+/// A blocking HTTPS client on OpenSSL alone, so that a test sends exactly the bytes that it wants to send.
+
+#pragma once
+
+#include "support/dev_sts.h"
+
+#include <memory>
+#include <string>
+#include <string_view>
+
+struct ssl_st;
+struct ssl_ctx_st;
+
+namespace DevStsTest {
+
+struct HttpAnswer {
+  int status = 0; ///< 0 when there was no answer
+  std::string head;
+  std::string body;
+};
+
+/// One connection to the service, which must show the certificate that its authority gave it.
+class TlsClient {
+public:
+  explicit TlsClient(const Testing::DevSts &service, bool v6 = false);
+  TlsClient(const TlsClient &) = delete;
+  TlsClient &operator=(const TlsClient &) = delete;
+  ~TlsClient();
+
+  void Send(std::string_view bytes);
+
+  /// The next answer, its body as long as its Content-Length says, or cut where the service has ended the connection.
+  HttpAnswer Receive();
+
+  /// Whether the service has ended the connection. Waits for it to send something or to end.
+  bool IsClosed();
+
+  int GetDescriptor() const noexcept { return m_descriptor; }
+
+private:
+  bool ReadSome();
+
+  std::unique_ptr<ssl_ctx_st, void (*)(ssl_ctx_st *)> m_context;
+  int m_descriptor;
+  std::unique_ptr<ssl_st, void (*)(ssl_st *)> m_tls;
+  std::string m_ahead;
+};
+
+/// A SOAP request over HTTP, as bytes. An empty content type leaves the header out.
+std::string PostBytes(std::string_view action, std::string_view message, std::string_view target = "/sts",
+                      std::string_view contentType = "text/xml");
+
+/// Sends the request on a connection of its own.
+HttpAnswer Post(const Testing::DevSts &service, std::string_view action, std::string_view message,
+                std::string_view target = "/sts");
+
+} // namespace DevStsTest
