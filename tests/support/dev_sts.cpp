@@ -84,7 +84,7 @@ DevSts::~DevSts() {
 
 void DevSts::Start(const std::vector<std::string> &arguments) {
   Require(*PROGRAM != '\0', "not built, because libxmlsec1 is missing");
-  std::vector<std::string> line = {PROGRAM, "--port", "0", "--until-eof"};
+  std::vector<std::string> line = {PROGRAM, "--until-eof"};
   if (std::find(arguments.begin(), arguments.end(), "--state") == arguments.end()) {
     line.insert(line.end(), {"--state", STATE});
   }

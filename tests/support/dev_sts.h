@@ -22,7 +22,7 @@ struct ProcessEnd {
 class DevSts {
 public:
   /// Starts the service on a free port and waits until it is ready. The keys are made by the first start in a build and
-  /// used by all others. `arguments` come behind --state, --port 0 and --until-eof, and so may name another --state.
+  /// used by all others, unless `arguments`, which come behind --until-eof, name another --state.
   /// @throws std::runtime_error with the service's own words when it does not get ready within a minute
   explicit DevSts(const std::vector<std::string> &arguments = {});
   DevSts(const DevSts &) = delete;
