@@ -3,12 +3,15 @@
 #include "crypto/openssl_use.h"
 
 #include "crypto/openssl_errors.h"
+#include "crypto/thread_lane.h"
 
 #include <tarvel/crypto/certificate.h>
 
 #include <openssl/crypto.h>
 #include <openssl/ssl.h>
 
+#include <algorithm>
+#include <array>
 #include <atomic>
 #include <chrono>
 #include <cstdint>
@@ -20,15 +23,20 @@ namespace Tarvel::Crypto {
 
 namespace {
 
-constexpr std::uint32_t ENDED = 1u << 31;
-
 /// A use is computation alone, so this is far more than one takes. A child process that was forked during a use of its
 /// parent's waits for all of it, for nobody there will end that use.
 constexpr std::chrono::milliseconds MAX_WAIT{500};
 constexpr std::chrono::microseconds WAIT_STEP{100};
 
-/// How many uses are going on, and whether there may be more. Constant-initialised and never destroyed.
-std::atomic<std::uint32_t> uses{0};
+/// The uses that are going on, counted by the lanes of the threads: one count for all would be what they queue up for.
+struct alignas(LANE_ALIGNMENT) Lane {
+  std::atomic<std::uint32_t> uses{0};
+};
+
+// Constant-initialised and never destroyed. Both are sequentially consistent: either the use that begins sees the end, or
+// whoever ends sees the use.
+std::array<Lane, 16> lanes;
+std::atomic<bool> ended{false};
 
 struct Abandoned {
   void *object;
@@ -36,36 +44,40 @@ struct Abandoned {
 };
 std::atomic<Abandoned *> abandoned{nullptr};
 
-bool TryBegin() noexcept {
-  std::uint32_t current = uses.load(std::memory_order_relaxed);
-  while ((current & ENDED) == 0) {
-    if (uses.compare_exchange_weak(current, current + 1, std::memory_order_acquire, std::memory_order_relaxed)) {
-      return true;
-    }
+/// Where the use is counted that has begun; null when none may begin any more.
+std::atomic<std::uint32_t> *TryBegin() noexcept {
+  std::atomic<std::uint32_t> &uses = lanes[GetThreadLane(lanes.size())].uses;
+  uses.fetch_add(1);
+  if (ended.load()) {
+    uses.fetch_sub(1);
+    return nullptr;
   }
-  return false;
+  return &uses;
+}
+
+bool IsAnyGoingOn() noexcept {
+  return std::any_of(lanes.begin(), lanes.end(), [](const Lane &lane) { return lane.uses.load() != 0; });
 }
 
 void OnCleanUp() noexcept {
-  uses.fetch_or(ENDED, std::memory_order_acq_rel);
-  for (auto waited = WAIT_STEP; uses.load(std::memory_order_acquire) != ENDED && waited < MAX_WAIT;
-       waited += WAIT_STEP) {
+  ended.store(true);
+  for (auto waited = WAIT_STEP; IsAnyGoingOn() && waited < MAX_WAIT; waited += WAIT_STEP) {
     std::this_thread::sleep_for(WAIT_STEP);
   }
 }
 
 } // namespace
 
-OpenSslUse::OpenSslUse() noexcept : m_isAllowed(TryBegin()) {}
+OpenSslUse::OpenSslUse() noexcept : m_count(TryBegin()) {}
 
 OpenSslUse::~OpenSslUse() {
-  if (m_isAllowed) {
-    uses.fetch_sub(1, std::memory_order_release);
+  if (m_count) {
+    m_count->fetch_sub(1);
   }
 }
 
 void OpenSslUse::Require() const {
-  if (!m_isAllowed) {
+  if (!m_count) {
     throw CryptoException("OpenSSL has cleaned itself up: the process is about to end");
   }
 }

@@ -4,6 +4,9 @@
 
 #pragma once
 
+#include <atomic>
+#include <cstdint>
+
 namespace Tarvel::Crypto {
 
 /// Around short uses of OpenSSL on a thread that nobody joins. OpenSSL's clean-up, which runs when the process ends or the
@@ -16,7 +19,7 @@ public:
   ~OpenSslUse();
 
   /// False once the clean-up has begun: then OpenSSL must not be called any more, not even to free what it made.
-  explicit operator bool() const noexcept { return m_isAllowed; }
+  explicit operator bool() const noexcept { return m_count != nullptr; }
 
   /// @throws CryptoException once the clean-up has begun.
   void Require() const;
@@ -30,7 +33,7 @@ public:
   static void Abandon(void *object) noexcept;
 
 private:
-  const bool m_isAllowed;
+  std::atomic<std::uint32_t> *const m_count; // of the lane in which it began; null when it is not allowed
 };
 
 } // namespace Tarvel::Crypto

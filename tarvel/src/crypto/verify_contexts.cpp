@@ -5,19 +5,22 @@
 namespace Tarvel::Crypto {
 
 VerifyContexts::~VerifyContexts() {
-  for (Slots &slots : m_slots) {
-    for (std::atomic<EVP_PKEY_CTX *> &slot : slots) {
+  for (Lane &lane : m_lanes) {
+    for (std::atomic<EVP_PKEY_CTX *> &slot : lane.contexts) {
       const KeyContextHandle freed(slot.load(std::memory_order_relaxed));
     }
   }
 }
 
-VerifyContexts::Slots &VerifyContexts::GetSlots(SignatureScheme scheme, DigestAlgorithm algorithm) noexcept {
-  return m_slots[static_cast<std::size_t>(scheme) * ALGORITHMS + static_cast<std::size_t>(algorithm)];
+std::atomic<EVP_PKEY_CTX *> &VerifyContexts::GetSlot(std::size_t lane, SignatureScheme scheme,
+                                                     DigestAlgorithm algorithm) noexcept {
+  const std::size_t kind = static_cast<std::size_t>(scheme) * ALGORITHMS + static_cast<std::size_t>(algorithm);
+  return m_lanes[(GetThreadLane(LANES) + lane) % LANES].contexts[kind];
 }
 
 KeyContextHandle VerifyContexts::Take(SignatureScheme scheme, DigestAlgorithm algorithm) noexcept {
-  for (std::atomic<EVP_PKEY_CTX *> &slot : GetSlots(scheme, algorithm)) {
+  for (std::size_t lane = 0; lane < LANES; ++lane) {
+    std::atomic<EVP_PKEY_CTX *> &slot = GetSlot(lane, scheme, algorithm);
     if (!slot.load(std::memory_order_relaxed)) {
       continue;
     }
@@ -29,9 +32,10 @@ KeyContextHandle VerifyContexts::Take(SignatureScheme scheme, DigestAlgorithm al
 }
 
 void VerifyContexts::Put(SignatureScheme scheme, DigestAlgorithm algorithm, KeyContextHandle context) noexcept {
-  for (std::atomic<EVP_PKEY_CTX *> &slot : GetSlots(scheme, algorithm)) {
+  for (std::size_t lane = 0; lane < LANES; ++lane) {
     EVP_PKEY_CTX *expected = nullptr;
-    if (slot.compare_exchange_strong(expected, context.get(), std::memory_order_release, std::memory_order_relaxed)) {
+    if (GetSlot(lane, scheme, algorithm)
+            .compare_exchange_strong(expected, context.get(), std::memory_order_release, std::memory_order_relaxed)) {
       static_cast<void>(context.release()); // the slot owns it now
       return;
     }

@@ -6,6 +6,7 @@
 
 #include "crypto/openssl_handles.h"
 #include "crypto/public_key.h"
+#include "crypto/thread_lane.h"
 
 #include <array>
 #include <atomic>
@@ -14,7 +15,7 @@
 namespace Tarvel::Crypto {
 
 /// Setting a verification context up costs a fifth of an RSA check, and a context is for one thread at a time: so a
-/// thread takes one out, uses it and puts it back. Lock-free; safe on any thread.
+/// thread takes one out, uses it and puts it back, the one of its own lane if it is there. Lock-free; safe on any thread.
 class VerifyContexts {
 public:
   VerifyContexts() = default;
@@ -31,14 +32,16 @@ public:
 private:
   static constexpr std::size_t SCHEMES = 3;
   static constexpr std::size_t ALGORITHMS = 3;
-  static constexpr std::size_t KEPT_CONTEXTS =
-      4; // threads beyond these that use one certificate at once set up their own
+  static constexpr std::size_t LANES = 4; // threads beyond these that use one certificate at once set up their own
 
-  using Slots = std::array<std::atomic<EVP_PKEY_CTX *>, KEPT_CONTEXTS>;
+  struct alignas(LANE_ALIGNMENT) Lane {
+    std::array<std::atomic<EVP_PKEY_CTX *>, SCHEMES * ALGORITHMS> contexts{};
+  };
 
-  Slots &GetSlots(SignatureScheme scheme, DigestAlgorithm algorithm) noexcept;
+  /// Of the lanes, counted from the calling thread's own.
+  std::atomic<EVP_PKEY_CTX *> &GetSlot(std::size_t lane, SignatureScheme scheme, DigestAlgorithm algorithm) noexcept;
 
-  std::array<Slots, SCHEMES * ALGORITHMS> m_slots{};
+  std::array<Lane, LANES> m_lanes;
 };
 
 } // namespace Tarvel::Crypto
