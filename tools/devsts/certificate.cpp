@@ -1,11 +1,12 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "certificate.h"
 
+#include "base64.h"
+
 #include <openssl/err.h>
 #include <openssl/x509_vfy.h>
 #include <openssl/x509v3.h>
 
-#include <algorithm>
 #include <array>
 #include <new>
 #include <vector>
@@ -34,22 +35,6 @@ std::vector<unsigned char> DerOf(const X509 &certificate) {
   return copy;
 }
 
-std::vector<unsigned char> DecodeBase64(std::string_view text) {
-  std::string packed;
-  std::copy_if(text.begin(), text.end(), std::back_inserter(packed),
-               [](char c) { return c != ' ' && c != '\t' && c != '\r' && c != '\n'; });
-  std::vector<unsigned char> bytes(packed.size() / 4 * 3);
-  if (packed.empty() || packed.size() % 4 != 0 || packed.size() > 65536 ||
-      EVP_DecodeBlock(bytes.data(), reinterpret_cast<const unsigned char *>(packed.data()),
-                      static_cast<int>(packed.size())) < 0) {
-    return {};
-  }
-  // The decoder counts the padding as octets.
-  const std::size_t padding = packed.size() - (packed.find_last_not_of('=') + 1);
-  bytes.resize(bytes.size() - std::min<std::size_t>(padding, 2));
-  return bytes;
-}
-
 /// The only entry of that kind in the name; empty for none or several.
 std::string OnlyEntry(const X509_NAME *name, int kind) {
   const int at = X509_NAME_get_index_by_NID(name, kind, -1);
@@ -74,12 +59,7 @@ Certificate DecodeCertificate(std::string_view base64) {
 }
 
 std::string EncodeCertificate(const X509 &certificate) {
-  const std::vector<unsigned char> der = DerOf(certificate);
-  std::string text((der.size() + 2) / 3 * 4 + 1, '\0'); // the encoder ends with a zero
-  const int length =
-      EVP_EncodeBlock(reinterpret_cast<unsigned char *>(text.data()), der.data(), static_cast<int>(der.size()));
-  text.resize(static_cast<std::size_t>(length));
-  return text;
+  return EncodeBase64(DerOf(certificate));
 }
 
 std::string ThumbprintOf(const X509 &certificate) {

@@ -56,6 +56,10 @@ constexpr NamedFault NAMED[] = {
     {"wrong-element", OfDocument(DocumentFault::WRONG_ELEMENT)},
     {"wrong-wrapper", OfDocument(DocumentFault::WRONG_WRAPPER)},
     {"wrong-status", OfDocument(DocumentFault::WRONG_STATUS)},
+    {"no-leg", OfDocument(DocumentFault::NO_LEG)},
+    {"garbage-leg", OfDocument(DocumentFault::GARBAGE_LEG)},
+    {"no-context", OfDocument(DocumentFault::NO_CONTEXT)},
+    {"other-context", OfDocument(DocumentFault::OTHER_CONTEXT)},
     {"expired-token", OfToken(TokenFault::EXPIRED)},
     {"early-token", OfToken(TokenFault::EARLY)},
     {"tampered-token", OfToken(TokenFault::TAMPERED)},
@@ -153,6 +157,36 @@ void Rename(xmlNode *element, const char *name) {
 void Empty(xmlNode *element) {
   if (element) {
     xmlNodeSetContent(element, nullptr);
+  }
+}
+
+void Remove(xmlNode *element) {
+  if (element) {
+    xmlUnlinkNode(element);
+    xmlFreeNode(element);
+  }
+}
+
+/// What is wrong with a leg of a negotiation. A response without one stays as it is.
+void SpoilLeg(xmlNode *root, DocumentFault fault) {
+  xmlNode *const response = FindBelow(root, "RequestSecurityTokenResponse");
+  xmlNode *const exchange = FindBelow(root, "BinaryExchange");
+  if (!response || !exchange) {
+    return;
+  }
+  switch (fault) {
+  case DocumentFault::NO_LEG:
+    Remove(exchange);
+    return;
+  case DocumentFault::GARBAGE_LEG:
+    SetText(*exchange, "Z2FyYmFnZQ==");
+    return;
+  case DocumentFault::NO_CONTEXT:
+    xmlUnsetProp(response, XmlText("Context"));
+    return;
+  default:
+    SetAttribute(*response, "Context", "urn:uuid:00000000-0000-4000-8000-000000000000");
+    return;
   }
 }
 
@@ -300,6 +334,12 @@ std::string SpoilResponse(xmlDoc &response, DocumentFault fault) {
     if (xmlNode *code = FindBelow(root, "Code")) {
       SetText(*code, std::string(Ns::WST.uri) + "/status/unknown");
     }
+    break;
+  case DocumentFault::NO_LEG:
+  case DocumentFault::GARBAGE_LEG:
+  case DocumentFault::NO_CONTEXT:
+  case DocumentFault::OTHER_CONTEXT:
+    SpoilLeg(root, fault);
     break;
   case DocumentFault::GARBLED_XML: {
     const std::string text = Serialise(response);

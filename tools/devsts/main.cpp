@@ -45,14 +45,12 @@ void WriteReadyLine(const StateFolder &state, std::uint16_t port) {
 }
 
 void Serve(const Options &options) {
-  if (options.keytab) {
-    throw std::runtime_error("--keytab: this build cannot negotiate");
-  }
   const EndSignals endSignals;
   RaiseDescriptorLimit();
   const SignatureEngine engine;
   const StateFolder state = OpenStateFolder(options.state);
-  const TokenService service(state, options.users ? Users(*options.users) : Users(), options.tolerance);
+  const TokenService service(state, options.users ? Users(*options.users) : Users(), options.tolerance,
+                             options.keytab ? CreateGssAcceptor(*options.keytab, options.state / "replays") : nullptr);
   const RequestHandler handler(service, options.fault);
   HttpsListener listener(state.tls, options.port, handler);
   listener.Start();

@@ -36,6 +36,7 @@ constexpr const char *BEARER_METHOD = "urn:oasis:names:tc:SAML:2.0:cm:bearer";
 constexpr const char *HOLDER_OF_KEY_METHOD = "urn:oasis:names:tc:SAML:2.0:cm:holder-of-key";
 constexpr const char *PASSWORD_CONTEXT = "urn:oasis:names:tc:SAML:2.0:ac:classes:PasswordProtectedTransport";
 constexpr const char *CERTIFICATE_CONTEXT = "urn:oasis:names:tc:SAML:2.0:ac:classes:X509";
+constexpr const char *KERBEROS_CONTEXT = "urn:oasis:names:tc:SAML:2.0:ac:classes:Kerberos";
 constexpr const char *ENTITY_FORMAT = "urn:oasis:names:tc:SAML:2.0:nameid-format:entity";
 constexpr const char *UPN_FORMAT = "http://schemas.xmlsoap.org/claims/UPN";
 
@@ -46,6 +47,7 @@ constexpr const char *LAST_NAME_ATTRIBUTE = "http://schemas.xmlsoap.org/ws/2005/
 
 constexpr const char *BASE64_ENCODING =
     "http://docs.oasis-open.org/wss/2004/01/oasis-200401-wss-soap-message-security-1.0#Base64Binary";
+constexpr const char *SPNEGO_VALUE_TYPE = "http://schemas.xmlsoap.org/ws/2005/02/trust/spnego";
 constexpr const char *X509_VALUE_TYPE =
     "http://docs.oasis-open.org/wss/2004/01/oasis-200401-wss-x509-token-profile-1.0#X509v3";
 constexpr const char *SAML_ID_VALUE_TYPE = "http://docs.oasis-open.org/wss/oasis-wss-saml-token-profile-1.1#SAMLID";

@@ -23,6 +23,9 @@ std::string Footer() {
          "      users.json: "
          "[{\"name\":\"carol@corp.example\",\"password\":\"...\",\"first\":\"Carol\",\"last\":\"Danvers\",\n"
          "      \"groups\":[\"users@corp.example\"]}]\n"
+         "  ssoclient-devsts --state DIR --keytab sts.keytab\n"
+         "      Negotiates as well, as every service whose key is in the keytab. alice@CORP.EXAMPLE is the user\n"
+         "      alice@corp.example.\n"
          "  ssoclient-devsts --state DIR --fault wrong-signer\n"
          "      Signs every token with a key that nobody trusts.\n";
 }
@@ -41,7 +44,8 @@ std::variant<Options, int> ReadOptions(int argc, char **argv) {
   app.add_option("--state", options.state, "Folder of keys and certificates, made when missing")->required();
   app.add_option("--port", options.port, "Port to listen on; 0 takes a free one")->capture_default_str();
   app.add_option("--users", options.users, "JSON file of the users; two are known without it")->type_name("FILE");
-  app.add_option("--keytab", options.keytab, "Keytab for SPNEGO negotiation")->type_name("FILE");
+  app.add_option("--keytab", options.keytab, "Keytab of the service's keys, for SPNEGO with Kerberos")
+      ->type_name("FILE");
   app.add_option("--fault", faultName, "Misbehave at every request; names below")->type_name("NAME");
   app.add_option("--tolerance", tolerance, "How far clocks may differ, in seconds")
       ->capture_default_str()

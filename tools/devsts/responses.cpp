@@ -1,6 +1,8 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "responses.h"
 
+#include "base64.h"
+
 #include <new>
 
 namespace DevSts {
@@ -18,7 +20,7 @@ xmlNode &BodyOf(xmlDoc &envelope) {
   return *ChildElements(*xmlDocGetRootElement(&envelope)).front();
 }
 
-void AddTokenResponse(xmlNode &parent, const xmlDoc &token) {
+xmlNode &AddTokenResponse(xmlNode &parent, const xmlDoc &token) {
   xmlNode &response = AddElement(parent, Ns::WST, "RequestSecurityTokenResponse");
   AddElement(response, Ns::WST, "TokenType", SAML_TOKEN_TYPE);
   xmlNode &requested = AddElement(response, Ns::WST, "RequestedSecurityToken");
@@ -27,6 +29,17 @@ void AddTokenResponse(xmlNode &parent, const xmlDoc &token) {
     throw std::bad_alloc();
   }
   xmlAddChild(&requested, copy);
+  return response;
+}
+
+void AddLeg(xmlNode &response, const std::string &context, const std::vector<unsigned char> &leg) {
+  SetAttribute(response, "Context", context);
+  if (leg.empty()) {
+    return;
+  }
+  xmlNode &exchange = AddElement(response, Ns::WST, "BinaryExchange", EncodeBase64(leg));
+  SetAttribute(exchange, "EncodingType", BASE64_ENCODING);
+  SetAttribute(exchange, "ValueType", SPNEGO_VALUE_TYPE);
 }
 
 } // namespace
@@ -34,6 +47,19 @@ void AddTokenResponse(xmlNode &parent, const xmlDoc &token) {
 Document IssueResponse(const xmlDoc &token) {
   Document document = NewEnvelope();
   AddTokenResponse(AddElement(BodyOf(*document), Ns::WST, "RequestSecurityTokenResponseCollection"), token);
+  return document;
+}
+
+Document LegResponse(const std::string &context, const std::vector<unsigned char> &leg) {
+  Document document = NewEnvelope();
+  AddLeg(AddElement(BodyOf(*document), Ns::WST, "RequestSecurityTokenResponse"), context, leg);
+  return document;
+}
+
+Document NegotiatedResponse(const std::string &context, const std::vector<unsigned char> &leg, const xmlDoc &token) {
+  Document document = NewEnvelope();
+  xmlNode &collection = AddElement(BodyOf(*document), Ns::WST, "RequestSecurityTokenResponseCollection");
+  AddLeg(AddTokenResponse(collection, token), context, leg);
   return document;
 }
 

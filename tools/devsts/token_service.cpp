@@ -1,11 +1,13 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "token_service.h"
 
+#include "base64.h"
 #include "responses.h"
 #include "token_issuer.h"
 #include "token_reader.h"
 
 #include <algorithm>
+#include <cctype>
 
 namespace DevSts {
 
@@ -63,6 +65,54 @@ void RequireAction(std::string_view action, const TrustRequest &request) {
   }
 }
 
+/// What the token is to say, who it is for apart.
+void ApplyRequest(TokenFacts &facts, const CheckedMessage &message, const TrustRequest &request) {
+  facts.certificate = ProofCertificate(message, request);
+  facts.audience = request.audience;
+  facts.advice = request.advice;
+  facts.renewals = request.renewable ? RENEWALS : 0;
+  ApplyDelegation(facts, request, message);
+}
+
+void SetUser(TokenFacts &facts, const User &user, const char *context) {
+  facts.subject = user.name;
+  facts.authenticated = Now();
+  facts.context = context;
+  facts.first = user.first;
+  facts.last = user.last;
+  std::transform(user.groups.begin(), user.groups.end(), std::back_inserter(facts.groups), GroupText);
+}
+
+/// "alice@CORP.EXAMPLE" as the service names its users: "alice@corp.example".
+std::string UserOf(std::string principal) {
+  const std::size_t at = std::min(principal.rfind('@'), principal.size());
+  std::transform(principal.begin() + static_cast<std::ptrdiff_t>(at), principal.end(),
+                 principal.begin() + static_cast<std::ptrdiff_t>(at),
+                 [](unsigned char c) { return static_cast<char>(std::tolower(c)); });
+  return principal;
+}
+
+std::string ReadContext(const xmlNode &request) {
+  const std::optional<std::string> context = AttributeOf(request, "Context");
+  if (!context || context->empty()) {
+    throw Refusal(Code::INVALID_REQUEST, "a leg of a negotiation must name its context");
+  }
+  return *context;
+}
+
+std::vector<unsigned char> ReadLeg(const xmlNode &exchange) {
+  if (AttributeOf(exchange, "ValueType").value_or("") != SPNEGO_VALUE_TYPE ||
+      AttributeOf(exchange, "EncodingType").value_or("") != BASE64_ENCODING) {
+    throw Refusal(Code::INVALID_REQUEST, "a binary exchange must be SPNEGO in Base64");
+  }
+  const std::string text = TextOf(exchange);
+  std::vector<unsigned char> leg = DecodeBase64(text);
+  if (leg.empty() && !text.empty()) {
+    throw Refusal(Code::INVALID_REQUEST, "the binary exchange is no Base64");
+  }
+  return leg;
+}
+
 std::string Summary(const char *what, const TokenFacts &facts, const xmlDoc &token) {
   return std::string(what) + " " + TokenId(token) + " for " + facts.subject +
          (facts.certificate.empty() ? " (bearer)" : " (holder-of-key)");
@@ -70,10 +120,12 @@ std::string Summary(const char *what, const TokenFacts &facts, const xmlDoc &tok
 
 } // namespace
 
-TokenService::TokenService(const StateFolder &state, Users users, std::chrono::seconds tolerance)
+TokenService::TokenService(const StateFolder &state, Users users, std::chrono::seconds tolerance,
+                           std::unique_ptr<const GssAcceptor> acceptor)
     : m_state(state), m_users(std::move(users)), m_signer(LoadSigningKey(state.signing)),
       m_foreignSigner(LoadSigningKey(state.foreign)),
-      m_verifier(PublicKeyOf(*state.signing.certificate)), m_policy{tolerance, &m_verifier} {}
+      m_verifier(PublicKeyOf(*state.signing.certificate)), m_policy{tolerance, &m_verifier},
+      m_negotiations(acceptor ? std::make_unique<Negotiations>(std::move(acceptor)) : nullptr) {}
 
 SoapAnswer TokenService::Answer(std::string_view action, std::string_view message, const Fault &fault) const {
   SoapAnswer answer;
@@ -101,6 +153,9 @@ SoapAnswer TokenService::Answer(std::string_view action, std::string_view messag
 Document TokenService::Process(std::string_view action, std::string_view message, const Fault &fault,
                                std::string &log) const {
   const CheckedMessage checked = CheckMessage(message, m_policy);
+  if (IsElement(*checked.request, Ns::WST, "RequestSecurityTokenResponse")) {
+    return ContinueNegotiation(action, checked, fault, log);
+  }
   const TrustRequest request = ReadTrustRequest(*checked.request);
   RequireAction(action, request);
   switch (request.type) {
@@ -116,16 +171,59 @@ Document TokenService::Process(std::string_view action, std::string_view message
 
 Document TokenService::Issue(const CheckedMessage &message, const TrustRequest &request, const Fault &fault,
                              std::string &log) const {
+  if (request.binaryExchange) {
+    return BeginNegotiation(message, request, fault, log);
+  }
   TokenFacts facts = Authenticate(message);
-  facts.certificate = ProofCertificate(message, request);
-  facts.audience = request.audience;
-  facts.advice = request.advice;
-  facts.renewals = request.renewable ? RENEWALS : 0;
-  ApplyDelegation(facts, request, message);
+  ApplyRequest(facts, message, request);
   SetLife(facts, request.lifetime);
   const Document token = MakeToken(facts, fault.token);
   log = Summary(message.presentedToken ? "exchanged, issued" : "issued", facts, *token);
   return IssueResponse(*token);
+}
+
+Document TokenService::BeginNegotiation(const CheckedMessage &message, const TrustRequest &request, const Fault &fault,
+                                        std::string &log) const {
+  if (message.presentedToken || message.credentials) {
+    throw Refusal(Code::INVALID_SECURITY, "the message negotiates and presents a token or a password as well");
+  }
+  const std::string context = ReadContext(*message.request);
+  NegotiatedRequest negotiated;
+  ApplyRequest(negotiated.facts, message, request);
+  negotiated.lifetime = request.lifetime;
+  const std::vector<unsigned char> leg = ReadLeg(*request.binaryExchange);
+  return AnswerLeg(context, RequireNegotiations().Begin(context, leg, std::move(negotiated)), fault, log);
+}
+
+Document TokenService::ContinueNegotiation(std::string_view action, const CheckedMessage &message, const Fault &fault,
+                                           std::string &log) const {
+  if (action != std::string(Ns::WST.uri) + "/RSTR/Issue") {
+    throw Refusal(Code::INVALID_REQUEST, "the SOAPAction does not fit the message");
+  }
+  const std::string context = ReadContext(*message.request);
+  const std::vector<unsigned char> leg = ReadLeg(RequireChild(*message.request, Ns::WST, "BinaryExchange"));
+  return AnswerLeg(context, RequireNegotiations().Continue(context, leg), fault, log);
+}
+
+Document TokenService::AnswerLeg(const std::string &context, NegotiationStep step, const Fault &fault,
+                                 std::string &log) const {
+  if (!step.leg.client) {
+    log = "negotiating";
+    return LegResponse(context, step.leg.answer);
+  }
+  TokenFacts &facts = step.request.facts;
+  SetClient(facts, *step.leg.client);
+  SetLife(facts, step.request.lifetime);
+  const Document token = MakeToken(facts, fault.token);
+  log = Summary("negotiated, issued", facts, *token);
+  return NegotiatedResponse(context, step.leg.answer, *token);
+}
+
+Negotiations &TokenService::RequireNegotiations() const {
+  if (!m_negotiations) {
+    throw Refusal(Code::REQUEST_FAILED, "the service was started without a keytab and does not negotiate");
+  }
+  return *m_negotiations;
 }
 
 Document TokenService::Renew(const CheckedMessage &message, const TrustRequest &request, const Fault &fault,
@@ -182,13 +280,16 @@ TokenFacts TokenService::FactsOfUser(const PasswordCredentials &credentials) con
     throw Refusal(Code::FAILED_AUTHENTICATION, "unknown user or wrong password");
   }
   TokenFacts facts;
-  facts.subject = user->name;
-  facts.authenticated = Now();
-  facts.context = PASSWORD_CONTEXT;
-  facts.first = user->first;
-  facts.last = user->last;
-  std::transform(user->groups.begin(), user->groups.end(), std::back_inserter(facts.groups), GroupText);
+  SetUser(facts, *user, PASSWORD_CONTEXT);
   return facts;
+}
+
+void TokenService::SetClient(TokenFacts &facts, const std::string &principal) const {
+  const User *const user = m_users.Find(UserOf(principal));
+  if (!user) {
+    throw Refusal(Code::FAILED_AUTHENTICATION, principal + " is none of the users");
+  }
+  SetUser(facts, *user, KERBEROS_CONTEXT);
 }
 
 TokenFacts TokenService::FactsOfCertificate(X509 &certificate) const {

@@ -6,11 +6,13 @@
 
 #include "faults.h"
 #include "message_check.h"
+#include "negotiations.h"
 #include "state_folder.h"
 #include "trust_request.h"
 #include "users.h"
 
 #include <chrono>
+#include <memory>
 #include <string>
 #include <string_view>
 
@@ -22,11 +24,13 @@ struct SoapAnswer {
   std::string log; ///< what happened, in words; nothing secret
 };
 
-/// Immutable; any number of threads may use it at once.
+/// Any number of threads may use it at once.
 class TokenService {
 public:
-  /// `state` outlives the service. @throws std::runtime_error when a key cannot be used
-  TokenService(const StateFolder &state, Users users, std::chrono::seconds tolerance);
+  /// `state` outlives the service. Without an acceptor, nobody can negotiate.
+  /// @throws std::runtime_error when a key cannot be used
+  TokenService(const StateFolder &state, Users users, std::chrono::seconds tolerance,
+               std::unique_ptr<const GssAcceptor> acceptor);
 
   /// `action` is the SOAPAction header's text, without quotation marks. A refusal is an answer too.
   SoapAnswer Answer(std::string_view action, std::string_view message, const Fault &fault) const;
@@ -35,6 +39,11 @@ private:
   Document Process(std::string_view action, std::string_view message, const Fault &fault, std::string &log) const;
   Document Issue(const CheckedMessage &message, const TrustRequest &request, const Fault &fault,
                  std::string &log) const;
+  Document BeginNegotiation(const CheckedMessage &message, const TrustRequest &request, const Fault &fault,
+                            std::string &log) const;
+  Document ContinueNegotiation(std::string_view action, const CheckedMessage &message, const Fault &fault,
+                               std::string &log) const;
+  Document AnswerLeg(const std::string &context, NegotiationStep step, const Fault &fault, std::string &log) const;
   Document Renew(const CheckedMessage &message, const TrustRequest &request, const Fault &fault,
                  std::string &log) const;
   Document Validate(const CheckedMessage &message, const TrustRequest &request, std::string &log) const;
@@ -42,6 +51,8 @@ private:
   TokenFacts Authenticate(const CheckedMessage &message) const;
   TokenFacts FactsOfUser(const PasswordCredentials &credentials) const;
   TokenFacts FactsOfCertificate(X509 &certificate) const;
+  void SetClient(TokenFacts &facts, const std::string &principal) const;
+  Negotiations &RequireNegotiations() const;
   Document MakeToken(TokenFacts facts, TokenFault fault) const;
 
   const StateFolder &m_state;
@@ -50,6 +61,7 @@ private:
   const SignatureKey m_foreignSigner;
   const SignatureKey m_verifier;
   const MessagePolicy m_policy;
+  const std::unique_ptr<Negotiations> m_negotiations; // null when nobody can negotiate
 };
 
 } // namespace DevSts
