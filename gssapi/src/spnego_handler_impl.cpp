@@ -140,16 +140,16 @@ void SpnegoHandlerImpl::CompleteWith(OM_uint32 contextFlags) {
 
 void SpnegoHandlerImpl::CountLeg() {
   if (m_legs == m_settings.maximumLegs) {
-    throw GssLimitException("The negotiation with " + m_settings.service + " did not end within " +
-                            std::to_string(m_settings.maximumLegs) + " legs");
+    throw GssLimitException("The negotiation with " + m_settings.service +
+                            " reached its limit on legs: " + std::to_string(m_settings.maximumLegs));
   }
   ++m_legs;
 }
 
-void SpnegoHandlerImpl::CheckTime() {
+void SpnegoHandlerImpl::CheckTime() const {
   if (m_clock() - m_start > std::chrono::seconds(m_settings.timeLimitSec)) {
-    throw GssLimitException("The negotiation with " + m_settings.service + " did not end within " +
-                            std::to_string(m_settings.timeLimitSec) + " seconds");
+    throw GssLimitException("The negotiation with " + m_settings.service +
+                            " reached its time limit: " + std::to_string(m_settings.timeLimitSec) + " s");
   }
 }
 

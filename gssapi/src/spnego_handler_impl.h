@@ -43,7 +43,7 @@ private:
   std::vector<std::uint8_t> AdvanceContext(const std::vector<std::uint8_t> &serviceLeg);
   void CompleteWith(OM_uint32 contextFlags);
   void CountLeg();
-  void CheckTime();
+  void CheckTime() const;
 
   const SpnegoSettings m_settings;
   const Clock m_clock;

@@ -182,7 +182,7 @@ void SpoilLeg(xmlNode *root, DocumentFault fault) {
     SetText(*exchange, "Z2FyYmFnZQ==");
     return;
   case DocumentFault::NO_CONTEXT:
-    xmlUnsetProp(response, XmlText("Context"));
+    SetAttribute(*response, "Context", "");
     return;
   default:
     SetAttribute(*response, "Context", "urn:uuid:00000000-0000-4000-8000-000000000000");

@@ -37,7 +37,7 @@ TEST(HandlerLimits, EndANegotiationThatTakesTooManyLegs) {
   const Bytes answer = service.Accept(*handler->NegotiateLeg({}));
   const Bytes finalLeg = service.Accept(*handler->NegotiateLeg(answer));
   EXPECT_THROWS_MESSAGE(handler->NegotiateLeg(finalLeg), GssLimitException,
-                        "The negotiation with sts@localhost did not end within 2 legs");
+                        "The negotiation with sts@localhost reached its limit on legs: 2");
   EXPECT_FALSE(handler->IsMutuallyAuthenticated());
 }
 
@@ -63,7 +63,7 @@ TEST(HandlerLimits, EndAServiceThatNeverIssuesTheToken) {
     EXPECT_TRUE(handler->NegotiateLeg({})->empty());
   }
   EXPECT_THROWS_MESSAGE(handler->NegotiateLeg({}), GssLimitException,
-                        "The negotiation with sts@localhost did not end within 10 legs");
+                        "The negotiation with sts@localhost reached its limit on legs: 10");
 }
 
 /// A handler with a limit of five seconds, and its clock.
@@ -90,7 +90,7 @@ TEST(HandlerLimits, EndANegotiationWhoseServiceTakesTooLong) {
   const Bytes finalLeg = service.Accept(*timed.handler->NegotiateLeg({}));
   timed.now += seconds(5) + milliseconds(1);
   EXPECT_THROWS_MESSAGE(timed.handler->NegotiateLeg(finalLeg), GssLimitException,
-                        "The negotiation with sts@localhost did not end within 5 seconds");
+                        "The negotiation with sts@localhost reached its time limit: 5 s");
   EXPECT_FALSE(timed.handler->IsMutuallyAuthenticated());
 }
 
@@ -112,7 +112,7 @@ TEST(HandlerLimits, CountTheTimeThatTheRealmTakes) {
   TimedNegotiation timed;
   timed.perLook = seconds(3); // the leg's beginning, a look before it, and one after it
   EXPECT_THROWS_MESSAGE(timed.handler->NegotiateLeg({}), GssLimitException,
-                        "The negotiation with sts@localhost did not end within 5 seconds");
+                        "The negotiation with sts@localhost reached its time limit: 5 s");
 }
 
 } // namespace
