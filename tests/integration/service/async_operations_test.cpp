@@ -155,7 +155,7 @@ protected:
   const std::int64_t m_begin = NowInMilliseconds();
   const Tarvel::Ref<Tarvel::Ssl::SSLContext> m_context = TrustingContext();
   std::weak_ptr<const SamlToken> m_held;
-  const Outcome m_outcome;
+  const Outcome m_outcome{};
 };
 
 TEST_P(EachAsyncOperationOverTls, CallsBackOnceOnAnotherThreadThoughAllIsReleased) {
