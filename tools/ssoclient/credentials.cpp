@@ -28,6 +28,14 @@ std::shared_ptr<const SamlToken> AcquireByToken(const AcquireCall &call) {
   return call.service.AcquireTokenByToken(*given, call.spec);
 }
 
+void CheckGss(const TokenSpec &, bool) {
+  RequireGss();
+}
+
+std::shared_ptr<const SamlToken> AcquireByTicket(const AcquireCall &call) {
+  return AcquireByGss(call.service, call.spec, call.credentials.gss, call.url);
+}
+
 void CheckCertificate(const TokenSpec &spec, bool) {
   if (spec.confirmation != TokenSpec::CONFIRMATION_DEFAULT) {
     throw UsageException("--bearer does not go with an identity alone, whose token is bound to its key");
@@ -43,6 +51,7 @@ constexpr CredentialsKind CHOSEN_KINDS[] = {
      AcquireByPassword},
     {"--token", [](const CredentialsOptions &options) { return !options.tokenFile.empty(); }, CheckExchange,
      AcquireByToken},
+    {"--gss", [](const CredentialsOptions &options) { return options.gss.isChosen; }, CheckGss, AcquireByTicket},
 };
 
 constexpr CredentialsKind IDENTITY_ALONE = {nullptr, nullptr, CheckCertificate, AcquireByCertificate};
@@ -53,6 +62,27 @@ constexpr CredentialsKind IDENTITY_ALONE = {nullptr, nullptr, CheckCertificate, 
     options += std::string(kind.option) + ", ";
   }
   throw UsageException("there are no credentials; give " + options + "or an identity (--cert and --key, or --p12)");
+}
+
+void AddGssOptions(CLI::App &app, GssOptions &options) {
+  CLI::Option *gss =
+      app.add_flag("--gss", options.isChosen, "Acquire by a Kerberos ticket, negotiated through the GSSAPI")
+          ->group(GROUP);
+  app.add_option(
+         "--service", options.service,
+         "The token service's principal, as HTTP@host or HTTP/host@REALM; without it, HTTP at the address's host")
+      ->type_name("PRINCIPAL")
+      ->group(GROUP)
+      ->needs(gss);
+  app.add_option("--ccache", options.credentialCache, "Credential cache with the ticket; without it, the default one")
+      ->type_name("NAME")
+      ->group(GROUP)
+      ->needs(gss);
+  app.add_option("--client-keytab", options.clientKeytab,
+                 "Keytab to get a ticket with, which is kept only in the cache that --ccache names")
+      ->type_name("FILE")
+      ->group(GROUP)
+      ->needs(gss);
 }
 
 } // namespace
@@ -67,6 +97,7 @@ void AddCredentialsOptions(CLI::App &app, CredentialsOptions &options) {
                  "Acquire in exchange for this token, an XML file; \"-\" is standard input; needs an identity")
       ->type_name("FILE")
       ->group(GROUP);
+  AddGssOptions(app, options.gss);
 }
 
 void ClaimInput(const CredentialsOptions &options, InputClaims &claims) {

@@ -4,6 +4,7 @@
 
 #pragma once
 
+#include "gss_credentials.h"
 #include "input_descriptor.h"
 #include "secret_input.h"
 #include "trust.h"
@@ -23,6 +24,7 @@ struct CredentialsOptions {
   std::string user;
   SecretOptions password{"password", {}, -1};
   std::string tokenFile;
+  GssOptions gss;
 };
 
 /// Everything that acquiring a token takes, whatever the kind.
@@ -30,6 +32,7 @@ struct AcquireCall {
   const SecurityTokenService &service;
   const TokenSpec &spec;
   const CredentialsOptions &credentials;
+  const std::string &url; ///< of the service
   const Tarvel::Crypto::CertificateList &trusted;
   std::int64_t toleranceSec;
 };

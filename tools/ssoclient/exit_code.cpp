@@ -5,6 +5,9 @@
 #include "exit_code.h"
 
 #include <ssoclient/exceptions.h>
+#ifdef SSOCLIENT_TOOL_HAS_GSSAPI
+#include <ssoclient/gssapi/exceptions.h>
+#endif
 #include <tarvel/core/exception.h>
 #include <tarvel/crypto/private_key.h>
 #include <tarvel/http/url.h>
@@ -25,7 +28,7 @@ constexpr Meaning MEANINGS[] = {
     {ExitCode::DONE, "done; for validate: the token is valid"},
     {ExitCode::UNEXPECTED, "unexpected failure"},
     {ExitCode::USAGE, "wrong command line"},
-    {ExitCode::CREDENTIALS_REFUSED, "credentials refused by the service"},
+    {ExitCode::CREDENTIALS_REFUSED, "credentials missing, expired, or refused by the service"},
     {ExitCode::COMMUNICATION, "communication with the service failed"},
     {ExitCode::TOKEN_INVALID, "token invalid or expired; for validate: the verdict"},
     {ExitCode::SIGNATURE_INVALID, "signature invalid"},
@@ -47,6 +50,12 @@ struct Row {
 // The first row that matches counts, so a class stands above its base.
 constexpr Row TABLE[] = {
     {IsA<UsageException>, {ExitCode::USAGE, "UsageException", "usage"}},
+#ifdef SSOCLIENT_TOOL_HAS_GSSAPI
+    {IsA<Gssapi::GssCredentialException>, {ExitCode::CREDENTIALS_REFUSED, "GssCredentialException", "credentials"}},
+    {IsA<Gssapi::GssLimitException>, {ExitCode::COMMUNICATION, "GssLimitException", "communication failed"}},
+    {IsA<Gssapi::GssNegotiationException>,
+     {ExitCode::COMMUNICATION, "GssNegotiationException", "communication failed"}},
+#endif
     {IsA<InvalidCredentialsException>,
      {ExitCode::CREDENTIALS_REFUSED, "InvalidCredentialsException", "credentials refused"}},
     {IsA<CommunicationException>, {ExitCode::COMMUNICATION, "CommunicationException", "communication failed"}},

@@ -12,14 +12,19 @@ namespace SsoClient::Tool {
 namespace {
 
 constexpr Command COMMANDS[] = {
-    {"acquire", "Ask the service for a token: by password, in exchange for a token, or by an identity",
+    {"acquire",
+     "Ask the service for a token: by password, in exchange for a token, by a Kerberos ticket, or by an "
+     "identity",
      "  ssoclient acquire --sts https://sts.corp.example/sts --ca ca.pem --trust sts.pem --user alice@corp.example\n"
      "  ssoclient acquire --sts https://sts.corp.example/sts --ca ca.pem --trust sts.pem \\\n"
      "      --user alice@corp.example --password-file password.txt --out alice.xml\n"
      "  ssoclient acquire --sts https://sts.corp.example/sts --ca ca.pem --trust sts.pem \\\n"
      "      --cert client.pem --key client.key --renewable --delegable --out client.xml\n"
      "  ssoclient acquire --sts https://sts.corp.example/sts --ca ca.pem --trust sts.pem \\\n"
-     "      --cert client.pem --key client.key --token client.xml --delegate-to bob@corp.example --lifetime 15m\n",
+     "      --cert client.pem --key client.key --token client.xml --delegate-to bob@corp.example --lifetime 15m\n"
+     "  ssoclient acquire --sts https://sts.corp.example/sts --ca ca.pem --trust sts.pem --gss\n"
+     "  ssoclient acquire --sts https://sts.corp.example/sts --ca ca.pem --trust sts.pem \\\n"
+     "      --gss --service HTTP/sts.corp.example@CORP.EXAMPLE --client-keytab robot.keytab\n",
      DefineAcquire},
     {"renew", "Ask the service for a new token in place of a renewable one",
      "  ssoclient renew --sts https://sts.corp.example/sts --ca ca.pem --trust sts.pem \\\n"

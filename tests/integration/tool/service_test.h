@@ -14,6 +14,7 @@
 #include <filesystem>
 #include <stdexcept>
 #include <string>
+#include <vector>
 
 #include <unistd.h>
 
@@ -23,7 +24,8 @@ namespace ToolTest {
 /// identities client and other-client as NAME.pem and NAME.key, and password.txt and wrong.txt.
 class ServiceTest : public testing::Test {
 protected:
-  ServiceTest() {
+  /// @param arguments for the service
+  explicit ServiceTest(const std::vector<std::string> &arguments = {}) : m_service(arguments) {
     const auto copy = [&](const char *from, const char *to) {
       std::filesystem::copy_file(m_service.PathOf(from), m_folder / to);
     };

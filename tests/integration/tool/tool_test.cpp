@@ -455,7 +455,7 @@ TEST(Tool, ListsItsCommandsAndExitCodesInTheHelp) {
   0    done; for validate: the token is valid
   1    unexpected failure
   2    wrong command line
-  3    credentials refused by the service
+  3    credentials missing, expired, or refused by the service
   4    communication with the service failed
   5    token invalid or expired; for validate: the verdict
   6    signature invalid

@@ -1,0 +1,34 @@
+// SPDX-License-Identifier: Apache-2.0
+
+#include "gss_credentials.h"
+
+#include <ssoclient/gssapi/spnego_handler.h>
+#include <tarvel/http/url.h>
+
+namespace SsoClient::Tool {
+namespace {
+
+/// The principal that web services have by custom (RFC 4559).
+std::string UsualService(const std::string &url) {
+  bool isSecure = false;
+  std::string host;
+  int port = 0;
+  std::string path;
+  Tarvel::Http::ParseHttpURL(url, isSecure, host, port, path);
+  return "HTTP@" + host;
+}
+
+} // namespace
+
+void RequireGss() {}
+
+std::shared_ptr<const SamlToken> AcquireByGss(const SecurityTokenService &service, const TokenSpec &spec,
+                                              const GssOptions &options, const std::string &url) {
+  Gssapi::SpnegoSettings settings;
+  settings.service = options.service.empty() ? UsualService(url) : options.service;
+  settings.credentialCache = options.credentialCache;
+  settings.clientKeytab = options.clientKeytab;
+  return service.AcquireTokenByGSS(spec, *Gssapi::CreateSpnegoHandler(settings));
+}
+
+} // namespace SsoClient::Tool

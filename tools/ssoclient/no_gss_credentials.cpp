@@ -1,0 +1,18 @@
+// SPDX-License-Identifier: Apache-2.0
+
+#include "exit_code.h"
+#include "gss_credentials.h"
+
+namespace SsoClient::Tool {
+
+void RequireGss() {
+  throw UsageException("--gss is not available: this ssoclient is built without the GSSAPI");
+}
+
+std::shared_ptr<const SamlToken> AcquireByGss(const SecurityTokenService & /*service*/, const TokenSpec & /*spec*/,
+                                              const GssOptions & /*options*/, const std::string & /*url*/) {
+  RequireGss();
+  return nullptr;
+}
+
+} // namespace SsoClient::Tool
