@@ -162,7 +162,21 @@ void Connection::Finish() {
 
 void Connection::Close() {
   m_stream.next_layer().expires_after(CLOSE_LIMIT);
-  m_stream.async_shutdown([self = shared_from_this()](const ErrorCode &) {});
+  m_stream.async_shutdown([self = shared_from_this()](const ErrorCode &) { self->Linger(); });
+}
+
+/// A socket that is closed with bytes unread sends a reset, which destroys the answer on its way to a client that is still
+/// sending. So what comes is read, until the client closes too or the limit is reached.
+void Connection::Linger() {
+  ErrorCode ignored;
+  m_stream.next_layer().socket().shutdown(asio::ip::tcp::socket::shutdown_send, ignored);
+  m_buffer.clear();
+  m_stream.next_layer().async_read_some(m_buffer.prepare(64 * 1024),
+                                        [self = shared_from_this()](const ErrorCode &error, std::size_t) {
+                                          if (!error) {
+                                            self->Linger();
+                                          }
+                                        });
 }
 
 void Connection::Reset() {

@@ -46,6 +46,7 @@ private:
   void WriteStep();
   void Finish();
   void Close();
+  void Linger();
   void Reset();
   void AwaitPeer();
   HttpRequest TakeRequest();
