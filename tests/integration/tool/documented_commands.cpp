@@ -70,10 +70,10 @@ std::vector<std::string> ExamplesOfManual() {
   return JoinContinued(lines);
 }
 
-std::vector<std::string> ExamplesOfReadme() {
+std::vector<std::string> ExamplesOfPage(const std::string &page) {
   std::vector<std::string> examples;
   for (const std::string &line :
-       JoinContinued(LinesBetween(ReadText(PROJECT_FOLDER "/README.md"), std::regex("```sh"), std::regex("```")))) {
+       JoinContinued(LinesBetween(ReadText(PROJECT_FOLDER "/" + page), std::regex("```sh"), std::regex("```")))) {
     if (line.find("ssoclient ") == 0) {
       examples.push_back(line);
     }
@@ -92,7 +92,8 @@ DocumentedCommands::DocumentedCommands(const std::vector<std::string> &serviceAr
 }
 
 void DocumentedCommands::ExpectToRun(const std::string &example) const {
-  std::string line = std::regex_replace(example, std::regex("https://sts\\.corp\\.example/\\S*"), m_service.GetUrl());
+  std::string line =
+      std::regex_replace(example, std::regex("https://(sts\\.corp\\.example|localhost:8443)/\\S*"), m_service.GetUrl());
   line = std::regex_replace(line, std::regex("HTTP/sts\\.corp\\.example@"), "HTTP/localhost@");
   const bool asks = line.find("--user") != std::string::npos && line.find("--password-") == std::string::npos;
   if (asks) {

@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// The command lines that the help, the manual and the README show, and a place where they can run.
+/// The command lines that the help, the manual and the pages show, and a place where they can run.
 
 #pragma once
 
@@ -14,7 +14,8 @@ namespace ToolTest {
 /// Each with its continuation lines.
 std::vector<std::string> ExamplesOfHelp(const std::string &command);
 std::vector<std::string> ExamplesOfManual();
-std::vector<std::string> ExamplesOfReadme();
+/// Of a page in Markdown, as "README.md": the lines of the shell blocks that begin with the tool.
+std::vector<std::string> ExamplesOfPage(const std::string &page);
 
 /// Whether an example needs a Kerberos realm.
 bool IsForTickets(const std::string &example);

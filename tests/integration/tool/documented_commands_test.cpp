@@ -44,7 +44,7 @@ TEST_F(Documented, OfTheManualRun) {
 }
 
 TEST_F(Documented, OfTheReadmeRun) {
-  const std::vector<std::string> examples = ExamplesOfReadme();
+  const std::vector<std::string> examples = ExamplesOfPage("README.md");
   EXPECT_FALSE(examples.empty());
   for (const std::string &example : examples) {
     RunUnlessForTickets(example);

@@ -1,11 +1,12 @@
 // SPDX-License-Identifier: Apache-2.0
-// Each command line of the help, the manual and the README that needs a Kerberos realm runs in one.
+// Each command line of the help, the manual and the pages that needs a Kerberos realm runs in one.
 
 #include "documented_commands.h"
 #include "ticket_world.h"
 
 #include <gtest/gtest.h>
 
+#include <cstdlib>
 #include <filesystem>
 #include <string>
 #include <vector>
@@ -18,7 +19,14 @@ protected:
   DocumentedForTickets() : DocumentedCommands(ServiceArguments()) {
     LogIn();
     std::filesystem::copy_file(PathOf(m_aliceKeytab), m_folder / "robot.keytab");
+    std::filesystem::create_directory(m_folder / "sts");
+    for (const char *file : {"authority.crt", "signing.crt"}) {
+      std::filesystem::copy_file(m_service.PathOf(file), m_folder / "sts/" + file);
+    }
+    setenv("KERBEROS_FOLDER", m_realm.GetFolder().c_str(), 1);
   }
+
+  ~DocumentedForTickets() override { unsetenv("KERBEROS_FOLDER"); }
 
   /// @return how many there are
   int RunThose(const std::vector<std::string> &examples) const {
@@ -39,6 +47,14 @@ TEST_F(DocumentedForTickets, OfTheHelpRun) {
 
 TEST_F(DocumentedForTickets, OfTheManualRun) {
   EXPECT_EQ(2, RunThose(ExamplesOfManual()));
+}
+
+TEST_F(DocumentedForTickets, OfThePageOnTicketsRun) {
+  EXPECT_EQ(4, RunThose(ExamplesOfPage("docs/gssapi.md")));
+}
+
+TEST_F(DocumentedForTickets, OfTheReadmeRun) {
+  EXPECT_EQ(1, RunThose(ExamplesOfPage("README.md")));
 }
 
 } // namespace
