@@ -49,6 +49,7 @@ public:
   /// What a client uses that names no cache. There is none until somebody gets a ticket into it.
   std::string GetDefaultCache() const { return NameFile("default_cache"); }
   std::string NameFile(const std::string &name) const { return "FILE:" + (m_folder / name).string(); }
+  pid_t GetCentre() const noexcept { return m_centre; }
   const std::filesystem::path &GetFolder() const noexcept { return m_folder; }
 
 private:

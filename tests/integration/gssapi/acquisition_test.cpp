@@ -12,6 +12,7 @@
 #include <future>
 #include <set>
 #include <string>
+#include <vector>
 
 namespace SsoClient::Gssapi {
 namespace {
@@ -91,6 +92,35 @@ TEST(GssAcquisition, RunsOnThePoolAsWell) {
                                     outcome.set_value(failure ? failure->what() : SubjectOf(*token));
                                   });
   EXPECT_EQ(outcome.get_future().get(), "alice@corp.example");
+}
+
+TEST(GssAcquisition, RunsOnSeveralThreadsAtOnce) {
+  constexpr std::size_t THREADS = 4;
+  constexpr int ROUNDS = 5;
+  const ServiceWorld world;
+  const auto service = CreateSecurityTokenService(world.MakeConfig());
+  SpnegoSettings withKeytab = SettingsFor();
+  withKeytab.clientKeytab = world.GetRealm().AddPrincipal("bob");
+  std::vector<std::future<std::string>> outcomes;
+  for (std::size_t i = 0; i < THREADS; ++i) {
+    const bool isBob = i % 2 == 1;
+    outcomes.push_back(std::async(std::launch::async, [&service, settings = isBob ? withKeytab : SettingsFor()] {
+      std::string subjects;
+      for (int round = 0; round < ROUNDS; ++round) {
+        const auto handler = CreateSpnegoHandler(settings);
+        subjects += SubjectOf(*service->AcquireTokenByGSS(HourSpec(), *handler)) + " ";
+        handler->RequireMutualAuthentication();
+      }
+      return subjects;
+    }));
+  }
+  for (std::size_t i = 0; i < THREADS; ++i) {
+    std::string expected;
+    for (int round = 0; round < ROUNDS; ++round) {
+      expected += i % 2 == 1 ? "bob@corp.example " : "alice@corp.example ";
+    }
+    EXPECT_EQ(outcomes[i].get(), expected);
+  }
 }
 
 TEST(GssAcquisition, TellsOfMissingCredentialsOnThePoolAsItsOwnClass) {

@@ -127,6 +127,15 @@ TEST(Credentials, AreRefusedWhenTheRealmsClockIsFarFromOurs) {
                           "No credentials in the keytab " + settings.clientKeytab + ": ", "Clock skew too great");
 }
 
+TEST(Credentials, CannotBeHadWithABrokenConfiguration) {
+  const RealmWithAlice world;
+  SpnegoSettings settings = SettingsFor();
+  settings.clientKeytab = world.userKeytab;
+  std::ofstream(world.realm.GetFolder() / "krb5.conf") << "[libdefaults\n";
+  EXPECT_FAILS_WITH_WORDS(MakeFirstLeg(settings), GssCredentialException, "No credential cache can be made in memory: ",
+                          "Improper format of Kerberos configuration file");
+}
+
 TEST(Credentials, AreNoneOnceTheNegotiationHasFailed) {
   const RealmWithAlice world;
   const auto handler = CreateSpnegoHandler(SettingsFor());

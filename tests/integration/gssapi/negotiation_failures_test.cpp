@@ -37,6 +37,13 @@ TEST(Negotiation, FailsForAServiceOfARealmThatOursDoesNotTrust) {
                           "Server krbtgt/OTHER.TEST@EXAMPLE.TEST not found in Kerberos database");
 }
 
+TEST(Negotiation, FailsForANameThatKerberosCannotRead) {
+  const RealmWithAlice world;
+  world.LogIn();
+  EXPECT_FAILS_WITH_WORDS(MakeFirstLeg(SettingsFor("sts/localhost@A@B")), GssNegotiationException,
+                          "The negotiation with sts/localhost@A@B failed: ", "Malformed representation of principal");
+}
+
 TEST(Negotiation, FailsWhenTheRealmDoesNotAnswer) {
   RealmWithAlice world;
   world.LogIn();
