@@ -8,6 +8,8 @@
 #include <array>
 #include <chrono>
 #include <csignal>
+#include <cstdio>
+#include <cstdlib>
 #include <filesystem>
 #include <fstream>
 #include <iterator>
@@ -52,6 +54,10 @@ void CloseDescriptor(int &descriptor) noexcept {
   }
 }
 
+int ExitCodeOf(int status) noexcept {
+  return WIFEXITED(status) ? WEXITSTATUS(status) : 128 + WTERMSIG(status);
+}
+
 /// Both ends of a pipe; what is not taken is closed.
 struct Pipe {
   Pipe() { Require(::pipe2(ends.data(), O_CLOEXEC) == 0, "no pipe"); }
@@ -73,13 +79,25 @@ DevSts::DevSts(const std::vector<std::string> &arguments) {
     Start(arguments);
     ReadReadyLine();
   } catch (...) {
+    Stop();
     Close();
     throw;
   }
 }
 
 DevSts::~DevSts() {
+  const int exitCode = Stop();
+  if (exitCode != 0) {
+    // A destructor, maybe behind the last test, has no other way to fail the program.
+    std::fprintf(stderr, "The development service has ended with %d\n%s", exitCode, GetLog().c_str());
+    std::fflush(nullptr);
+    std::_Exit(EXIT_FAILURE);
+  }
   Close();
+}
+
+const char *DevSts::GetProgram() noexcept {
+  return PROGRAM;
 }
 
 void DevSts::Start(const std::vector<std::string> &arguments) {
@@ -122,7 +140,10 @@ void DevSts::ReadReadyLine() {
     Require(left > 0 && ::poll(&output, 1, static_cast<int>(left)) >= 0, "not ready in time: " + GetLog());
     std::array<char, 4096> buffer;
     const ssize_t count = output.revents == 0 ? -1 : ::read(m_out, buffer.data(), buffer.size());
-    Require(count != 0, "ended: " + GetLog());
+    if (count == 0) {
+      const int exitCode = Stop();
+      Require(false, "ended with " + std::to_string(exitCode) + ": " + GetLog());
+    }
     m_readyLine.append(buffer.data(), count > 0 ? static_cast<std::size_t>(count) : 0);
   }
   m_rest = m_readyLine.substr(m_readyLine.find('\n') + 1);
@@ -165,7 +186,7 @@ ProcessEnd DevSts::End(int signal) {
   }
   int status = 0;
   Require(AwaitEnd(END_MILLISECONDS, status), "does not end");
-  end.exitCode = WIFEXITED(status) ? WEXITSTATUS(status) : 128 + WTERMSIG(status);
+  end.exitCode = ExitCodeOf(status);
   return end;
 }
 
@@ -180,13 +201,17 @@ bool DevSts::AwaitEnd(int milliseconds, int &status) noexcept {
   return ended;
 }
 
-void DevSts::Close() noexcept {
+int DevSts::Stop() noexcept {
   CloseDescriptor(m_in);
   int status = 0;
   if (m_process > 0 && !AwaitEnd(END_MILLISECONDS, status)) {
     ::kill(m_process, SIGKILL);
     ::waitpid(m_process, &status, 0);
   }
+  return ExitCodeOf(status);
+}
+
+void DevSts::Close() noexcept {
   CloseDescriptor(m_out);
   CloseDescriptor(m_log);
 }

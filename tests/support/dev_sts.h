@@ -23,12 +23,16 @@ class DevSts {
 public:
   /// Starts the service on a free port and waits until it is ready. The keys are made by the first start in a build and
   /// used by all others, unless `arguments`, which come behind --until-eof, name another --state.
-  /// @throws std::runtime_error with the service's own words when it does not get ready within a minute
+  /// @throws std::runtime_error with the service's exit code and own words when it does not get ready within a minute
   explicit DevSts(const std::vector<std::string> &arguments = {});
   DevSts(const DevSts &) = delete;
   DevSts &operator=(const DevSts &) = delete;
-  /// Ends the service, by force if need be. Should the test die before, the service sees its standard input end.
+  /// Ends the service, by force if need be. Should the test die before, the service sees its standard input end. A service
+  /// that does not end well, as when a sanitizer has found something in it, ends the test program with a failure.
   ~DevSts();
+
+  /// The path of the service's program.
+  static const char *GetProgram() noexcept;
 
   const std::string &GetUrl() const noexcept { return m_url; }
   /// The address under which this one fault is met.
@@ -53,6 +57,7 @@ private:
   void Start(const std::vector<std::string> &arguments);
   void ReadReadyLine();
   bool AwaitEnd(int milliseconds, int &status) noexcept;
+  int Stop() noexcept;
   void Close() noexcept;
 
   std::string m_url;

@@ -15,6 +15,7 @@
 
 #include <cstdio>
 #include <stdexcept>
+#include <utility>
 
 #include <sys/resource.h>
 #include <unistd.h>
@@ -48,8 +49,9 @@ void Serve(const Options &options) {
   const EndSignals endSignals;
   RaiseDescriptorLimit();
   const SignatureEngine engine;
+  Users users = options.users ? Users(*options.users) : Users();
   const StateFolder state = OpenStateFolder(options.state);
-  const TokenService service(state, options.users ? Users(*options.users) : Users(), options.tolerance,
+  const TokenService service(state, std::move(users), options.tolerance,
                              options.keytab ? CreateGssAcceptor(*options.keytab, options.state / "replays") : nullptr);
   const RequestHandler handler(service, options.fault);
   HttpsListener listener(state.tls, options.port, handler);

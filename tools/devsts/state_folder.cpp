@@ -220,6 +220,10 @@ Identity OpenIdentity(const fs::path &folder, const Purpose &purpose, const Iden
   if (X509_check_private_key(identity.certificate.get(), key.get()) != 1) {
     FailAt(identity.certificateFile, "does not belong to the key beside it");
   }
+  if (!purpose.isSelfSigned &&
+      X509_verify(identity.certificate.get(), X509_get0_pubkey(authority->certificate.get())) != 1) {
+    FailAt(identity.certificateFile, "is of another authority; remove the state folder, and it is made anew");
+  }
   if (X509_cmp_current_time(X509_get0_notAfter(identity.certificate.get())) <= 0) {
     FailAt(identity.certificateFile, "has expired; remove the state folder, and it is made anew");
   }

@@ -76,6 +76,9 @@ Users::Users(const std::filesystem::path &file) {
   }
   try {
     m_users = ReadUsers(Json::parse(stream));
+  } catch (const Json::parse_error &failure) {
+    // Its own words quote what was read last, which may be a password.
+    throw std::runtime_error(file.string() + ": not JSON at byte " + std::to_string(failure.byte));
   } catch (const std::exception &failure) {
     throw std::runtime_error(file.string() + ": " + failure.what());
   }

@@ -3,14 +3,18 @@
 
 #include "messages.h"
 
+#include "support/work_folder.h"
+
 #include <gmock/gmock.h>
 #include <nlohmann/json.hpp>
 
 #include <csignal>
+#include <cstdio>
+#include <cstdlib>
 #include <filesystem>
-#include <fstream>
+#include <thread>
 
-#include <stdlib.h>
+#include <sys/wait.h>
 
 namespace DevStsTest {
 namespace {
@@ -18,32 +22,7 @@ namespace {
 namespace fs = std::filesystem;
 using Testing::DevSts;
 using testing::HasSubstr;
-
-/// A folder of its own, removed with all that is in it.
-class TemporaryFolder {
-public:
-  TemporaryFolder() {
-    std::string pattern = (fs::temp_directory_path() / "devsts-XXXXXX").string();
-    if (!mkdtemp(pattern.data())) {
-      throw std::runtime_error("no temporary folder");
-    }
-    m_path = pattern;
-  }
-  TemporaryFolder(const TemporaryFolder &) = delete;
-  TemporaryFolder &operator=(const TemporaryFolder &) = delete;
-  ~TemporaryFolder() {
-    std::error_code ignored;
-    fs::remove_all(m_path, ignored);
-  }
-  std::string operator/(const char *name) const { return (m_path / name).string(); }
-  std::string Write(const char *name, const std::string &content) const {
-    std::ofstream(m_path / name) << content;
-    return *this / name;
-  }
-
-private:
-  fs::path m_path;
-};
+using Testing::WorkFolder;
 
 /// What a start that must fail says.
 std::string FailureOf(const std::vector<std::string> &arguments) {
@@ -53,6 +32,16 @@ std::string FailureOf(const std::vector<std::string> &arguments) {
     return failure.what();
   }
   return "started";
+}
+
+/// What the program writes to standard output, and the exit code behind it.
+std::string OutputOf(const std::string &arguments) {
+  std::FILE *const stream = ::popen((DevSts::GetProgram() + (" " + arguments) + " </dev/null").c_str(), "r");
+  std::string output;
+  for (int octet = 0; (octet = std::fgetc(stream)) != EOF;) {
+    output += static_cast<char>(octet);
+  }
+  return output + "exit code " + std::to_string(WEXITSTATUS(::pclose(stream)));
 }
 
 TEST(Process, EndsAtSigtermWithZero) {
@@ -78,6 +67,14 @@ TEST(Process, EndsAtOnceThoughConnectionsAreOpen) {
   TlsClient stalled(service);
   stalled.Send(PostBytes(SsoClient::Request::ISSUE, "", "/sts/fault/stall"));
   EXPECT_EQ(service.End(SIGTERM).exitCode, 0);
+}
+
+TEST(Process, ThatEndsBadlyFailsTheTestsThatUseIt) {
+  const auto abortService = [] {
+    const DevSts service;
+    ::kill(service.GetProcess(), SIGABRT);
+  };
+  EXPECT_EXIT(abortService(), testing::ExitedWithCode(EXIT_FAILURE), "The development service has ended with 134\n");
 }
 
 TEST(Process, ReadyLineTellsAddressAndFiles) {
@@ -110,7 +107,7 @@ TEST(Process, RefusesAPortThatIsTaken) {
 }
 
 TEST(State, IsForItsOwnerAlone) {
-  const TemporaryFolder folder;
+  const WorkFolder folder;
   const DevSts service({"--state", folder / "state"});
   EXPECT_EQ(fs::status(folder / "state").permissions(), fs::perms::owner_all);
   int keys = 0;
@@ -124,7 +121,7 @@ TEST(State, IsForItsOwnerAlone) {
 }
 
 TEST(State, IsUsedAgain) {
-  const TemporaryFolder folder;
+  const WorkFolder folder;
   std::string first;
   {
     const DevSts service({"--state", folder / "state"});
@@ -134,8 +131,43 @@ TEST(State, IsUsedAgain) {
   EXPECT_EQ(service.ReadStateFile("signing.crt") + service.ReadStateFile("client.key"), first);
 }
 
+TEST(State, IsMadeOnceByStartsAtTheSameTime) {
+  const WorkFolder folder;
+  constexpr std::size_t STARTS = 4;
+  std::vector<std::string> identities(STARTS);
+  std::vector<std::thread> threads;
+  for (std::size_t i = 0; i < STARTS; ++i) {
+    threads.emplace_back([&, i] {
+      const DevSts service({"--state", folder / "state"});
+      identities[i] = IsIssued(Send(service, CertificateRequest(service)))
+                          ? service.ReadStateFile("signing.crt") + service.ReadStateFile("client.key")
+                          : "nothing issued";
+    });
+  }
+  for (std::thread &thread : threads) {
+    thread.join();
+  }
+  EXPECT_THAT(identities[0], HasSubstr("-----BEGIN CERTIFICATE-----"));
+  EXPECT_EQ(identities, std::vector<std::string>(STARTS, identities[0]));
+}
+
+TEST(State, IsRefusedWhenItsAuthorityHasChanged) {
+  const WorkFolder folder;
+  { const DevSts service({"--state", folder / "state"}); }
+  fs::remove(folder / "state/authority.crt");
+  EXPECT_EQ(FailureOf({"--state", folder / "state"}),
+            "development service: ended with 1: ssoclient-devsts: " + (folder / "state/tls.crt") +
+                ": is of another authority; remove the state folder, and it is made anew\n");
+}
+
+TEST(State, IsNotMadeWhenTheRestOfTheCommandLineIsWrong) {
+  const WorkFolder folder;
+  FailureOf({"--state", folder / "state", "--users", folder / "missing"});
+  EXPECT_EQ(folder.Names(), std::set<std::string>());
+}
+
 TEST(State, IsCompletedWhenAStartWasInterrupted) {
-  const TemporaryFolder folder;
+  const WorkFolder folder;
   { const DevSts service({"--state", folder / "state"}); }
   fs::remove(folder / "state/client.crt"); // the certificate is written last
   const DevSts service({"--state", folder / "state"});
@@ -143,23 +175,23 @@ TEST(State, IsCompletedWhenAStartWasInterrupted) {
 }
 
 TEST(State, IsRefusedWhenAKeyDoesNotFit) {
-  const TemporaryFolder folder;
+  const WorkFolder folder;
   { const DevSts service({"--state", folder / "state"}); }
   fs::copy_file(folder / "state/client.key", folder / "state/signing.key", fs::copy_options::overwrite_existing);
   EXPECT_EQ(FailureOf({"--state", folder / "state"}),
-            "development service: ended: ssoclient-devsts: " + (folder / "state/signing.crt") +
+            "development service: ended with 1: ssoclient-devsts: " + (folder / "state/signing.crt") +
                 ": does not belong to the key beside it\n");
 }
 
 TEST(State, IsRefusedWhenItIsNoFolder) {
-  const TemporaryFolder folder;
+  const WorkFolder folder;
   const std::string file = folder.Write("file", "");
   EXPECT_EQ(FailureOf({"--state", file}),
-            "development service: ended: ssoclient-devsts: " + file + ": Not a directory\n");
+            "development service: ended with 1: ssoclient-devsts: " + file + ": Not a directory\n");
 }
 
 TEST(UsersFile, ReplacesTheKnownUsers) {
-  const TemporaryFolder folder;
+  const WorkFolder folder;
   const std::string file = folder.Write("users.json", R"([{"name":"carol@other.example","password":"pass <&> word",
       "first":"Carol","last":"D","groups":["ops@other.example"]}])");
   const DevSts service({"--users", file});
@@ -171,27 +203,47 @@ TEST(UsersFile, ReplacesTheKnownUsers) {
 }
 
 TEST(UsersFile, IsRefusedWhenItIsOfAnotherForm) {
-  const TemporaryFolder folder;
+  const WorkFolder folder;
   const auto refusal = [&folder](const std::string &content) {
     return FailureOf({"--users", folder.Write("users.json", content)});
   };
-  const std::string begin = "development service: ended: ssoclient-devsts: " + (folder / "users.json") + ": ";
-  EXPECT_THAT(refusal("not JSON"), HasSubstr(begin));
+  const std::string begin = "development service: ended with 1: ssoclient-devsts: " + (folder / "users.json") + ": ";
+  EXPECT_EQ(refusal("not JSON"), begin + "not JSON at byte 2\n");
+  EXPECT_EQ(refusal(R"([{"name":"c@d","password":"secret" x)"), begin + "not JSON at byte 36\n"); // and no password
   EXPECT_EQ(refusal("{}"), begin + "not an array of users\n");
   EXPECT_THAT(refusal(R"([{"name":"carol@other.example"}])"), HasSubstr("key 'password' not found"));
   EXPECT_EQ(refusal(R"([{"name":"carol","password":""}])"), begin + "'carol' is not of the form name@domain\n");
   EXPECT_EQ(refusal(R"([{"name":"c@d","password":""},{"name":"c@d","password":""}])"), begin + "'c@d' stands twice\n");
   EXPECT_EQ(FailureOf({"--users", folder / "missing"}),
-            "development service: ended: ssoclient-devsts: " + (folder / "missing") + ": cannot be read\n");
+            "development service: ended with 1: ssoclient-devsts: " + (folder / "missing") + ": cannot be read\n");
 }
 
-TEST(CommandLine, UnknownFaultIsRefused) {
-  EXPECT_EQ(FailureOf({"--fault", "no-such-fault"}),
-            "development service: ended: ssoclient-devsts: --fault: no fault is named 'no-such-fault'; see --help\n");
+TEST(CommandLine, RefusalsAreOneLineAndExitCode2) {
+  const struct {
+    std::vector<std::string> arguments;
+    const char *message;
+  } cases[] = {
+      {{"--fault", "no-such-fault"}, "--fault: no fault is named 'no-such-fault'; see --help"},
+      {{"--tolerance", "-1"}, "--tolerance: Value -1 not in range 0 to 86400"},
+      {{"--port", "65536"}, "Could not convert: --port = 65536"},
+      {{"--no-such-option"}, "The following argument was not expected: --no-such-option"},
+      {{"--state"}, "--state: 1 required TEXT missing"},
+  };
+  for (const auto &refused : cases) {
+    EXPECT_EQ(FailureOf(refused.arguments),
+              std::string("development service: ended with 2: ssoclient-devsts: ") + refused.message + "\n");
+  }
+  EXPECT_EQ(OutputOf("2>&1"), "ssoclient-devsts: --state is required\nexit code 2");
 }
 
-TEST(CommandLine, ToleranceOutOfRangeIsRefused) {
-  EXPECT_THAT(FailureOf({"--tolerance", "-1"}), HasSubstr("ssoclient-devsts: --tolerance: "));
+TEST(CommandLine, HelpTellsOptionsFaultsAndExamplesOnStandardOutput) {
+  const std::string help = OutputOf("--help 2>&1");
+  for (const char *part : {"Usage: ssoclient-devsts [OPTIONS]\n", "--until-eof ", "\nFaults:\n", " bad-status-NNN",
+                           " soap-fault-FailedAuthentication", "\nExamples:\n  ssoclient-devsts --state "}) {
+    EXPECT_THAT(help, HasSubstr(part));
+  }
+  EXPECT_THAT(help, testing::EndsWith("\nexit code 0"));
+  EXPECT_THAT(OutputOf("--version"), testing::MatchesRegex("ssoclient-devsts [0-9.]+\nexit code 0"));
 }
 
 } // namespace

@@ -6,6 +6,7 @@
 #include <openssl/ssl.h>
 
 #include <array>
+#include <cerrno>
 #include <charconv>
 #include <csignal>
 #include <cstdint>
@@ -76,21 +77,33 @@ std::size_t NumberBehind(std::string_view head, std::string_view field) {
 
 } // namespace
 
+RawConnection::RawConnection(const Testing::DevSts &service, bool v6) : m_descriptor(Connect(service.GetPort(), v6)) {}
+
+RawConnection::~RawConnection() {
+  ::close(m_descriptor);
+}
+
+void RawConnection::Send(std::string_view bytes) {
+  Require(::send(m_descriptor, bytes.data(), bytes.size(), MSG_NOSIGNAL) == static_cast<ssize_t>(bytes.size()),
+          "cannot send");
+}
+
+bool RawConnection::IsEnded() {
+  std::array<char, 4096> dropped;
+  ssize_t count = 0;
+  while ((count = ::recv(m_descriptor, dropped.data(), dropped.size(), 0)) > 0) {
+  }
+  return count == 0 || errno == ECONNRESET;
+}
+
 TlsClient::TlsClient(const Testing::DevSts &service, bool v6)
-    : m_context(NewContext(service), SSL_CTX_free), m_descriptor(Connect(service.GetPort(), v6)),
+    : m_context(NewContext(service), SSL_CTX_free), m_connection(service, v6),
       m_tls(SSL_new(m_context.get()), SSL_free) {
   std::signal(SIGPIPE, SIG_IGN); // OpenSSL writes to a connection that the service has reset without asking for silence
   ERR_clear_error();
-  const bool shaken = SSL_set_fd(m_tls.get(), m_descriptor) == 1 && SSL_set1_host(m_tls.get(), "localhost") == 1 &&
-                      SSL_connect(m_tls.get()) == 1;
-  if (!shaken) {
-    ::close(m_descriptor);
-  }
-  Require(shaken, "no handshake");
-}
-
-TlsClient::~TlsClient() {
-  ::close(m_descriptor);
+  Require(SSL_set_fd(m_tls.get(), m_connection.GetDescriptor()) == 1 && SSL_set1_host(m_tls.get(), "localhost") == 1 &&
+              SSL_connect(m_tls.get()) == 1,
+          "no handshake");
 }
 
 void TlsClient::Send(std::string_view bytes) {

@@ -21,13 +21,31 @@ struct HttpAnswer {
   std::string body;
 };
 
+/// A connection to the service without TLS.
+class RawConnection {
+public:
+  explicit RawConnection(const Testing::DevSts &service, bool v6 = false);
+  RawConnection(const RawConnection &) = delete;
+  RawConnection &operator=(const RawConnection &) = delete;
+  ~RawConnection();
+
+  void Send(std::string_view bytes);
+
+  /// Whether the service ends the connection, which is waited for; whatever it sends before is dropped.
+  bool IsEnded();
+
+  int GetDescriptor() const noexcept { return m_descriptor; }
+
+private:
+  int m_descriptor;
+};
+
 /// One connection to the service, which must show the certificate that its authority gave it.
 class TlsClient {
 public:
   explicit TlsClient(const Testing::DevSts &service, bool v6 = false);
   TlsClient(const TlsClient &) = delete;
   TlsClient &operator=(const TlsClient &) = delete;
-  ~TlsClient();
 
   void Send(std::string_view bytes);
 
@@ -37,13 +55,11 @@ public:
   /// Whether the service has ended the connection. Waits for it to send something or to end.
   bool IsClosed();
 
-  int GetDescriptor() const noexcept { return m_descriptor; }
-
 private:
   bool ReadSome();
 
   std::unique_ptr<ssl_ctx_st, void (*)(ssl_ctx_st *)> m_context;
-  int m_descriptor;
+  RawConnection m_connection;
   std::unique_ptr<ssl_st, void (*)(ssl_st *)> m_tls;
   std::string m_ahead;
 };

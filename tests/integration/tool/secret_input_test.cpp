@@ -5,8 +5,8 @@
 #include "closed_port.h"
 #include "expect_result.h"
 #include "process.h"
+#include "support/work_folder.h"
 #include "terminal.h"
-#include "work_folder.h"
 
 #include <gtest/gtest.h>
 
@@ -16,6 +16,8 @@
 
 namespace ToolTest {
 namespace {
+
+using Testing::WorkFolder;
 
 constexpr const char *TOKENS = TEST_DATA_DIR "/tokens";
 constexpr const char *KEYS = TEST_DATA_DIR "/crypto";

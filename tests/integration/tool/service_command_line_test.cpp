@@ -4,7 +4,7 @@
 #include "closed_port.h"
 #include "expect_result.h"
 #include "process.h"
-#include "work_folder.h"
+#include "support/work_folder.h"
 
 #include <gtest/gtest.h>
 
@@ -16,6 +16,8 @@
 
 namespace ToolTest {
 namespace {
+
+using Testing::WorkFolder;
 
 struct Refusal {
   const char *name;

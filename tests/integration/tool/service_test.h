@@ -5,9 +5,9 @@
 #pragma once
 
 #include "process.h"
-#include "work_folder.h"
 
 #include "support/dev_sts.h"
+#include "support/work_folder.h"
 
 #include <gtest/gtest.h>
 
@@ -19,6 +19,8 @@
 #include <unistd.h>
 
 namespace ToolTest {
+
+using Testing::WorkFolder;
 
 /// Each test has the service, and a folder with ca.pem (who vouches for the server), sts.pem (who signs tokens), the
 /// identities client and other-client as NAME.pem and NAME.key, and password.txt and wrong.txt.

@@ -10,16 +10,17 @@
 #include <fstream>
 #include <iterator>
 #include <set>
+#include <stdexcept>
 #include <string>
 
-#include <unistd.h>
+#include <stdlib.h>
 
-namespace ToolTest {
+namespace Testing {
 
 /// A new, empty folder that goes with all that is in it at the end.
 class WorkFolder {
 public:
-  WorkFolder() : m_path(testing::TempDir() + "ssoclient_tool_XXXXXX") {
+  WorkFolder() : m_path(testing::TempDir() + "ssoclient_XXXXXX") {
     if (!mkdtemp(m_path.data())) {
       throw std::runtime_error("mkdtemp");
     }
@@ -55,4 +56,4 @@ private:
   std::string m_path;
 };
 
-} // namespace ToolTest
+} // namespace Testing
