@@ -1,7 +1,7 @@
 # SPDX-License-Identifier: Apache-2.0
 # `cpack` in a build with prefix /usr makes Debian packages: the libraries, what is needed to build against them, the
-# tool, and, when it is built, the negotiation handler over the GSSAPI with what is needed to build against that. Needs
-# dpkg-dev.
+# tool, the development token service, and, when it is built, the negotiation handler over the GSSAPI with what is needed to
+# build against that. Needs dpkg-dev.
 
 set(CPACK_GENERATOR DEB)
 set(CPACK_PACKAGE_NAME ssoclient)
@@ -14,7 +14,7 @@ set(CPACK_STRIP_FILES ON)
 
 set(CPACK_COMPONENTS_ALL runtime development)
 if(SSOCLIENT_BUILD_TOOLS)
-  list(APPEND CPACK_COMPONENTS_ALL tools)
+  list(APPEND CPACK_COMPONENTS_ALL tools devsts)
 endif()
 if(TARGET ssoclient_gssapi)
   list(APPEND CPACK_COMPONENTS_ALL gssapi gssapi-development)
@@ -43,5 +43,7 @@ set(CPACK_DEBIAN_GSSAPI-DEVELOPMENT_PACKAGE_DEPENDS
   "libssoclient-gssapi${PROJECT_VERSION_MAJOR} (= ${PROJECT_VERSION}), libssoclient-dev (= ${PROJECT_VERSION})")
 set(CPACK_DEBIAN_TOOLS_PACKAGE_NAME ssoclient)
 set(CPACK_DEBIAN_TOOLS_PACKAGE_SECTION utils)
+set(CPACK_DEBIAN_DEVSTS_PACKAGE_NAME ssoclient-devsts)
+set(CPACK_DEBIAN_DEVSTS_PACKAGE_SECTION devel)
 
 include(CPack)
