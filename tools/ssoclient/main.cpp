@@ -5,6 +5,7 @@
 #include "command.h"
 #include "exit_code.h"
 #include "interruption.h"
+#include "standard_streams.h"
 
 #include <map>
 
@@ -128,6 +129,7 @@ int Run(int argc, char **argv) {
 int main(int argc, char **argv) {
   using namespace SsoClient::Tool;
   try {
+    KeepStandardStreamsApart();
     CatchEndingSignals();
     return Run(argc, argv);
   } catch (const std::exception &failure) {

@@ -130,11 +130,17 @@ TEST_F(Validate, ReportsAnOutputThatCannotBeWritten) {
                "ssoclient: file: standard output: No space left on device\n");
 }
 
+TEST_F(Validate, ReportsAStandardStreamThatIsClosed) {
+  ExpectResult(Run("ssoclient validate " + Service() + "token.xml >&-"), 7, "",
+               "ssoclient: file: standard output: Bad file descriptor\n");
+  ExpectResult(Run("ssoclient validate " + Service() + "- <&-"), 7, "", "ssoclient: file: -: Bad file descriptor\n");
+}
+
 TEST_F(Validate, ShowsTheLibrarysLogAndNoTokenInIt) {
   const Result result = Run("ssoclient validate -v " + Service() + "token.xml");
   EXPECT_EQ("valid\n", result.out);
   EXPECT_THAT(result.err, HasSubstr(" START operation SecurityTokenServiceImpl::ValidateSubject\n"));
-  EXPECT_THAT(result.err, HasSubstr("\nssoclient: log: Result: "));
+  EXPECT_THAT(result.err, HasSubstr("\nssoclient: log: Result: true\n"));
   EXPECT_THAT(result.err, HasSubstr(" END operation SecurityTokenServiceImpl::ValidateSubject\n"));
   EXPECT_THAT(result.err, testing::Not(HasSubstr("saml:")));
 }
