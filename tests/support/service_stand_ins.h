@@ -40,6 +40,9 @@ inline std::string ToString(const Bytes &bytes) {
 
 class RequestBuilderStandIn final : public SsoClient::RequestBuilder {
 public:
+  /// @param onCall called at the beginning of each call; what it throws is the builder's refusal
+  explicit RequestBuilderStandIn(std::function<void()> onCall = [] {}) : m_onCall(std::move(onCall)) {}
+
   void BuildUserPassTokenRequest(const std::string &username, const std::string &password,
                                  const SsoClient::TokenSpec &spec, SsoClient::Request &request) const override {
     Fill(request, "UserPass " + username + " " + password + " " + Text(spec));
@@ -69,13 +72,16 @@ public:
 
 private:
   static std::string Text(const SsoClient::TokenSpec &spec) { return std::to_string(spec.tokenLifetimeSec); }
-  static void Fill(SsoClient::Request &request, const std::string &call) {
+  void Fill(SsoClient::Request &request, const std::string &call) const {
+    m_onCall();
     if (!request.soapAction.empty() || !request.body.empty()) {
       throw std::logic_error("the request was used before");
     }
     request.soapAction = "urn:action";
     request.body = call;
   }
+
+  const std::function<void()> m_onCall;
 };
 
 /// What the service answers to a request. What it throws is the transport's failure.

@@ -1,4 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
+#include "support/identity.h"
 #include "support/posting_server.h"
 #include "support/soap_responses.h"
 #include "support/throws_message.h"
@@ -42,6 +43,17 @@ TEST(CreateGssNegotiationContext, MakesAContextThatNegotiatesOverTlsAfterTheConf
   const GssNegotiationResult last = context->NegotiateToken({8});
   EXPECT_EQ(*last.serverLeg, (Bytes{4, 5, 6}));
   EXPECT_NE(last.token, nullptr);
+}
+
+TEST(CreateGssNegotiationContext, GivesTheHolderOfKeyIdentityToTheRequests) {
+  const Testing::PostingServer server(
+      {Testing::IntermediateLeg("ctx", "AQID"), Testing::IntermediateLeg("ctx", "AQID")});
+  SecurityTokenServiceConfig config = ConfigFor(server.GetUrl());
+  CreateGssNegotiationContext(config, Spec())->NegotiateToken({7});
+  EXPECT_EQ(server.GetRequests().at(0).find("ds:SignatureValue"), std::string::npos);
+  config.holderOfKeyConfig = Testing::HolderIdentity();
+  CreateGssNegotiationContext(config, Spec())->NegotiateToken({7});
+  EXPECT_NE(server.GetRequests().at(1).find("ds:SignatureValue"), std::string::npos);
 }
 
 TEST(CreateGssNegotiationContext, RefusesAConfigurationWithoutTrustedCertificates) {

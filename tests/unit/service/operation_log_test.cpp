@@ -9,6 +9,7 @@
 
 #include <gtest/gtest.h>
 
+#include <algorithm>
 #include <functional>
 #include <memory>
 #include <ostream>
@@ -151,6 +152,32 @@ TEST_P(OperationLog, TellsStartRequestAndEndOfAnOperationThatFails) {
   EXPECT_EQ(log.Lines(), FrameOf(GetParam().name, {GetParam().request, processing}));
 }
 
+TEST_P(OperationLog, TellsStartRequestAndEndWhenTheRequestCannotBeBuiltAndNoSendingOfIt) {
+  const Testing::FixedEnvironment environment;
+  const RecordedLog log;
+  const auto refuse = [] { throw Tarvel::InvalidArgumentException("no such lifetime"); };
+  const auto transport = std::make_shared<Testing::TransportStandIn>([](const Request &) { return "issued:"; });
+  const SecurityTokenServiceImpl service(std::make_shared<const Testing::RequestBuilderStandIn>(refuse), transport,
+                                         std::make_shared<const Testing::ResponseHandlerStandIn>(),
+                                         Testing::TrustedCertificates());
+  EXPECT_THROWS_MESSAGE(GetParam().run(service, m_token), Tarvel::InvalidArgumentException,
+                        "Invalid argument : no such lifetime");
+  EXPECT_EQ(log.Lines(), FrameOf(GetParam().name, {{GetParam().request.front()}}));
+  EXPECT_EQ(transport->Sent(), Texts{});
+  EXPECT_EQ(transport->CountSessions(),
+            GetParam().name == std::string("AcquireTokenByGSS") ? 1 : 0); // for all its legs
+  EXPECT_EQ(transport->CountOpenSessions(), 0);
+}
+
+TEST_P(OperationLog, TellsStartRequestAndEndWhenTheTransportFailsAndNoProcessingOfAResponse) {
+  const Testing::FixedEnvironment environment;
+  const RecordedLog log;
+  const auto transport = std::make_shared<Testing::TransportStandIn>(
+      [](const Request &) -> std::string { throw CommunicationException("gone"); });
+  EXPECT_THROWS_MESSAGE(GetParam().run(*Testing::ServiceOn(transport), m_token), CommunicationException, "gone");
+  EXPECT_EQ(log.Lines(), FrameOf(GetParam().name, {GetParam().request}));
+}
+
 TEST_P(OperationLog, ComputesAndWritesNothingBelowLevel64) {
   const Testing::ScopedLogLevel level(63);
   const RecordedLog log;
@@ -160,6 +187,26 @@ TEST_P(OperationLog, ComputesAndWritesNothingBelowLevel64) {
 }
 
 INSTANTIATE_TEST_SUITE_P(EachOperation, OperationLog, testing::ValuesIn(LoggedOperations()),
+                         [](const auto &operation) { return std::string(operation.param.name); });
+
+class OperationLogOfAWrongToken : public OperationLog {};
+
+TEST_P(OperationLogOfAWrongToken, TellsOfNoSuccess) {
+  const Testing::FixedEnvironment environment;
+  const RecordedLog log;
+  EXPECT_THROWS_MESSAGE(Run(GetParam().response + Testing::ReadDataFile("tokens/signed-by-other.xml")),
+                        InvalidSignatureException, "Failed to verify signature: token might have been tampered with.");
+  EXPECT_EQ(log.Lines(), FrameOf(GetParam().name, {GetParam().request, GetParam().result}));
+}
+
+std::vector<LoggedOperation> LoggedTokenOperations() {
+  std::vector<LoggedOperation> operations = LoggedOperations();
+  operations.erase(std::remove_if(operations.begin(), operations.end(), [](const auto &o) { return !o.yieldsToken; }),
+                   operations.end());
+  return operations;
+}
+
+INSTANTIATE_TEST_SUITE_P(EachTokenOperation, OperationLogOfAWrongToken, testing::ValuesIn(LoggedTokenOperations()),
                          [](const auto &operation) { return std::string(operation.param.name); });
 
 TEST(OperationLogOfATokenlessAnswer, SaysNothingOfASuccess) {
