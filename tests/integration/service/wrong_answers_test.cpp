@@ -2,6 +2,7 @@
 // Every wrong answer of the development service, to each operation: the class and the whole message of the exception, and
 // that the same service object works afterwards.
 #include "integration/service/service_client.h"
+#include "integration/service/wrong_answers.h"
 
 #include <ssoclient/exceptions.h>
 #include <tarvel/system/date_time.h>
@@ -11,9 +12,7 @@
 #include <functional>
 #include <memory>
 #include <ostream>
-#include <regex>
 #include <string>
-#include <typeinfo>
 #include <vector>
 
 namespace SsoClient {
@@ -21,45 +20,6 @@ namespace {
 
 using namespace Testing;
 using TokenPtr = std::shared_ptr<const SamlToken>;
-
-struct WrongAnswer {
-  const char *fault;
-  /// "CLASS: MESSAGE" of the exception. %e stands for the endpoint, and what differs from one answer to the next is
-  /// reduced: lines, columns and lengths to "#", dates to "DATE".
-  const char *outcome;
-};
-
-/// Nothing that is thrown but one of these.
-std::string ClassOf(const std::exception &exception) {
-  const struct {
-    const std::type_info &type;
-    const char *name;
-  } classes[] = {{typeid(SsoException), "SsoException"},
-                 {typeid(InvalidCredentialsException), "InvalidCredentialsException"},
-                 {typeid(CommunicationException), "CommunicationException"},
-                 {typeid(InvalidSignatureException), "InvalidSignatureException"}};
-  for (const auto &known : classes) {
-    if (known.type == typeid(exception)) {
-      return known.name;
-    }
-  }
-  return typeid(exception).name();
-}
-
-std::string Reduce(std::string message) {
-  const struct {
-    std::string pattern;
-    const char *replacement;
-  } reductions[] = {{"localhost:" + std::to_string(RunningService().GetPort()), "%e"},
-                    {"line [0-9]+, column", "line #, column"},
-                    {"column [0-9]+", "column #"},
-                    {"after [0-9]+ of the body's [0-9]+ bytes", "after # of the body's # bytes"},
-                    {R"(\d{4}-\d\d-\d\dT\d\d:\d\d:\d\d\.\d{3}Z)", "DATE"}};
-  for (const auto &reduction : reductions) {
-    message = std::regex_replace(message, std::regex(reduction.pattern), reduction.replacement);
-  }
-  return message;
-}
 
 struct Operation {
   const char *name;
@@ -102,77 +62,9 @@ const Operation OPERATIONS[] = {
 /// Outcome of the operation that `run` runs on a service at `url`, and then of the same on the same service.
 std::string OutcomesOf(const Operation &operation, const std::string &fault, const SamlToken &held) {
   const ServiceClient client("client", RunningService().FaultUrl(fault) + "/once/" + operation.name);
-  std::string outcome;
-  try {
-    outcome = operation.run(*client, held);
-  } catch (const std::exception &exception) {
-    outcome = ClassOf(exception) + ": " + Reduce(exception.what());
-  }
+  const std::string outcome = OutcomeOf([&] { return operation.run(*client, held); }, RunningService().GetPort());
   return outcome + "; then " + operation.run(*client, held);
 }
-
-// Whatever was asked for.
-const WrongAnswer TO_ALL[] = {
-    {"reset", "CommunicationException: The TLS connection to localhost broke: The connection to %e broke: Connection "
-              "reset by peer"},
-    {"reset-in-header", "CommunicationException: The TLS connection to localhost broke: The connection to %e broke: "
-                        "Connection reset by peer"},
-    {"reset-in-body", "CommunicationException: The TLS connection to localhost broke: The connection to %e broke: "
-                      "Connection reset by peer"},
-    {"truncate", "CommunicationException: Bad response from %e: the connection ended after # of the body's # bytes"},
-    {"oversize", "CommunicationException: Bad response from %e: the body is longer than 16777216 bytes"},
-    {"bad-status", "CommunicationException: Server returned error: 503 Service Unavailable"},
-    {"bad-status-404", "CommunicationException: Server returned error: 404 Not Found"},
-    {"bad-status-302", "CommunicationException: Server returned error: 302 Status"},
-    {"bad-content-length",
-     "CommunicationException: Bad response from %e: its header is not HTTP/1.x (bad Content-Length)"},
-    {"garbage", "CommunicationException: Bad response from %e: its header is not HTTP/1.x (bad version)"},
-    {"bad-status-200", "SsoException: Response is not well-formed XML: Start tag expected, '<' not found at line #, "
-                       "column #"},
-    {"bad-status-500", "SsoException: Response is not well-formed XML: Start tag expected, '<' not found at line #, "
-                       "column #"},
-    {"garbled-xml", "SsoException: Response is not well-formed XML: Opening and ending tag mismatch: Envelope line 1 "
-                    "and garbled at line #, column #"},
-    {"doctype", "SsoException: Response is not well-formed XML: a document type declaration is not accepted at line "
-                "#, column #"},
-    {"too-deep",
-     "SsoException: Response is not well-formed XML: elements are nested deeper than 256 at line #, column #"},
-    {"empty-body", "SsoException: Response is not well-formed XML: Document is empty at line #, column #"},
-    {"not-soap", "SsoException: Unexpected response format: missing SAOP Body."},
-    {"wrong-root", "SsoException: Unexpected response format: missing SAOP Body."},
-    {"no-token", "SsoException: Unexpected XML format"},
-    {"wrong-element", "SsoException: Unexpected XML format"},
-    {"wrong-wrapper", "SsoException: Unexpected XML format"},
-    {"soap-fault-without-code", "SsoException: Invalid SOAP response: missing faultcode."},
-    {"soap-fault-without-text", "InvalidCredentialsException: Authentication failed"},
-    {"soap-fault-FailedAuthentication", "InvalidCredentialsException: Authentication failed: a fault was asked for"},
-    {"soap-fault-InvalidSecurityToken", "InvalidCredentialsException: Authentication failed: a fault was asked for"},
-    {"soap-fault-wsse-InvalidSecurityToken",
-     "InvalidCredentialsException: Authentication failed: a fault was asked for"},
-    {"soap-fault-wsse-FailedAuthentication",
-     "SsoException: Unexpected SOAP fault: wsse:FailedAuthentication; request failed."},
-    {"soap-fault-InvalidRequest", "SsoException: Unexpected SOAP fault: wst:InvalidRequest; request failed."},
-    {"soap-fault-RequestFailed", "SsoException: Unexpected SOAP fault: wst:RequestFailed; request failed."},
-    {"soap-fault-InvalidTimeRange", "SsoException: Unexpected SOAP fault: wst:InvalidTimeRange; request failed."},
-    {"soap-fault-UnableToRenew", "SsoException: Unexpected SOAP fault: wst:UnableToRenew; request failed."},
-    {"soap-fault-InvalidSecurity", "SsoException: Unexpected SOAP fault: wsse:InvalidSecurity; request failed."},
-    {"soap-fault-FailedCheck", "SsoException: Unexpected SOAP fault: wsse:FailedCheck; request failed."},
-    {"soap-fault-MessageExpired", "SsoException: Unexpected SOAP fault: wsu:MessageExpired; request failed."},
-    {"soap-fault-Unknown", "SsoException: Unexpected SOAP fault: devsts:Unknown; request failed."},
-};
-
-// Where a token was asked for.
-const WrongAnswer INSTEAD_OF_A_TOKEN[] = {
-    {"expired-token", "SsoException: The token has expired at: DATE"},
-    {"early-token", "SsoException: Token start date is in the future: DATE"},
-    {"tampered-token", "InvalidSignatureException: Failed to verify signature: token might have been tampered with."},
-    {"wrong-signer", "InvalidSignatureException: Failed to verify signature: token might have been tampered with."},
-    {"unsigned-token", "SsoException: Signature syntax error: Expected ds:Signature, found \"saml:Subject\" at line #, "
-                       "column #"},
-    {"no-subject", "SsoException: Expected element 'Subject' not found."},
-    {"unknown-element", "SsoException: Unexpected elements under Assertion"},
-    {"wrong-version", "SsoException: Invalid token version"},
-};
 
 class EachOperationAnsweredWrongly : public testing::TestWithParam<Operation> {
 protected:
