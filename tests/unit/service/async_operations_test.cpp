@@ -1,6 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "support/counting_token.h"
 #include "support/data_file.h"
+#include "support/operation_outcome.h"
 #include "support/recorded_log.h"
 #include "support/rendezvous.h"
 #include "support/service_stand_ins.h"
@@ -13,13 +14,10 @@
 #include <algorithm>
 #include <functional>
 #include <memory>
-#include <mutex>
 #include <ostream>
-#include <set>
 #include <stdexcept>
 #include <string>
 #include <thread>
-#include <typeinfo>
 #include <vector>
 
 namespace SsoClient {
@@ -28,67 +26,13 @@ namespace {
 using Testing::CountingToken;
 using Testing::EventCount;
 using Testing::Gate;
+using Testing::OperationOutcome;
 using Testing::RecordedLog;
 using Testing::ServiceOn;
 using Testing::SpecFor;
 using Testing::TransportStandIn;
 using TokenPtr = std::shared_ptr<const SamlToken>;
 using Texts = std::vector<std::string>;
-
-/// How an operation ended, as its completion was told. Shared by the completions that it makes, which may outlive it.
-class Outcome {
-public:
-  SecurityTokenService::TokenCompletion ForToken() const {
-    return [state = m_state](const TokenPtr &token, const Tarvel::Exception *failure) {
-      state->Note(token ? token->GetSubject().ToString() : "null", failure);
-    };
-  }
-  SecurityTokenService::ValidityCompletion ForValidity() const {
-    return [state = m_state](const boost::optional<bool> &valid, const Tarvel::Exception *failure) {
-      state->Note(!valid ? "empty" : *valid ? "true" : "false", failure);
-    };
-  }
-
-  /// "RESULT" of a success, "RESULT and CLASS: MESSAGE" of a failure; one after the other.
-  Texts Wait(int count = 1) const {
-    EXPECT_TRUE(m_state->called.WaitFor(count));
-    const std::lock_guard<std::mutex> lock(m_state->mutex);
-    return m_state->results;
-  }
-
-  std::set<std::thread::id> Threads() const {
-    const std::lock_guard<std::mutex> lock(m_state->mutex);
-    return m_state->threads;
-  }
-
-private:
-  struct State {
-    void Note(const std::string &result, const Tarvel::Exception *failure) {
-      {
-        const std::lock_guard<std::mutex> lock(mutex);
-        results.push_back(result + (failure ? " and " + Describe(*failure) : ""));
-        threads.insert(std::this_thread::get_id());
-      }
-      called.Add();
-    }
-
-    static std::string Describe(const Tarvel::Exception &failure) {
-      const bool isCredentials = typeid(failure) == typeid(InvalidCredentialsException);
-      const bool isArgument = typeid(failure) == typeid(Tarvel::InvalidArgumentException);
-      return std::string(isCredentials ? "credentials"
-                         : isArgument  ? "argument"
-                                       : typeid(failure).name()) +
-             ": " + failure.what();
-    }
-
-    std::mutex mutex;
-    Texts results;
-    std::set<std::thread::id> threads;
-    EventCount called;
-  };
-
-  const std::shared_ptr<State> m_state = std::make_shared<State>();
-};
 
 /// Makes objects whose destruction is counted.
 template <typename T, typename... Args>
@@ -104,7 +48,7 @@ struct AsyncOperation {
   const char *responseBegin;
   bool yieldsToken;
   const char *request;
-  std::function<void(const SecurityTokenService &, const TokenPtr &, const Outcome &)> start;
+  std::function<void(const SecurityTokenService &, const TokenPtr &, const OperationOutcome &)> start;
 };
 
 void PrintTo(const AsyncOperation &operation, std::ostream *out) {
@@ -115,29 +59,29 @@ std::vector<AsyncOperation> AsyncOperations() {
   using Service = SecurityTokenService;
   return {
       {"AcquireTokenAsync", "issued:", true, "1: UserPass alice pass 60",
-       [](const Service &service, const TokenPtr &, const Outcome &outcome) {
+       [](const Service &service, const TokenPtr &, const OperationOutcome &outcome) {
          service.AcquireTokenAsync("alice", "pass", SpecFor(60), outcome.ForToken());
        }},
       {"AcquireTokenByGssAsync", "leg:context||", true, "1: InitialSPNego 60 hello",
-       [](const Service &service, const TokenPtr &, const Outcome &outcome) {
+       [](const Service &service, const TokenPtr &, const OperationOutcome &outcome) {
          using Handler = Testing::NegotiationHandlerStandIn;
          const std::vector<std::shared_ptr<Testing::Bytes>> script = {Testing::Leg("hello")};
          service.AcquireTokenByGssAsync(SpecFor(60), std::make_shared<Handler>(script), outcome.ForToken());
        }},
       {"AcquireTokenByCertificateAsync", "issued:", true, "1: Certificate 60",
-       [](const Service &service, const TokenPtr &, const Outcome &outcome) {
+       [](const Service &service, const TokenPtr &, const OperationOutcome &outcome) {
          service.AcquireTokenByCertificateAsync(SpecFor(60), outcome.ForToken());
        }},
       {"AcquireTokenByTokenAsync", "issued:", true, "1: Exchange 60",
-       [](const Service &service, const TokenPtr &token, const Outcome &outcome) {
+       [](const Service &service, const TokenPtr &token, const OperationOutcome &outcome) {
          service.AcquireTokenByTokenAsync(token, SpecFor(60), outcome.ForToken());
        }},
       {"ValidateSubjectAsync", "valid:true", false, "1: ValidateSubject",
-       [](const Service &service, const TokenPtr &token, const Outcome &outcome) {
+       [](const Service &service, const TokenPtr &token, const OperationOutcome &outcome) {
          service.ValidateSubjectAsync(token, outcome.ForValidity());
        }},
       {"RenewTokenAsync", "renewed:", true, "1: Renew 60",
-       [](const Service &service, const TokenPtr &token, const Outcome &outcome) {
+       [](const Service &service, const TokenPtr &token, const OperationOutcome &outcome) {
          service.RenewTokenAsync(token, 60, outcome.ForToken());
        }},
   };
@@ -158,7 +102,7 @@ TEST_P(EachAsyncOperation, RunsOnAnotherThreadAndCallsBackOnceThere) {
   const RecordedLog log;
   auto transport =
       MakeCounted<TransportStandIn>(m_transportGone, [response = Response()](const Request &) { return response; });
-  const Outcome outcome;
+  const OperationOutcome outcome;
   GetParam().start(*ServiceOn(transport), std::make_shared<CountingToken>(), outcome);
   EXPECT_EQ(outcome.Wait(), Texts{Result()});
   EXPECT_EQ(transport->Sent(), Texts{GetParam().request});
@@ -177,7 +121,7 @@ TEST_P(EachAsyncOperation, KeepsWhatItNeedsUntilItIsDoneAndNoLonger) {
   });
   auto service = ServiceOn(transport);
   TokenPtr token = MakeCounted<CountingToken>(m_tokenGone);
-  const Outcome outcome;
+  const OperationOutcome outcome;
   GetParam().start(*service, token, outcome);
   service.reset();
   transport.reset();
@@ -192,7 +136,7 @@ TEST_P(EachAsyncOperation, KeepsWhatItNeedsUntilItIsDoneAndNoLonger) {
 
 TEST_P(EachAsyncOperation, ReportsAFailureOnceWithNothingButTheException) {
   auto transport = MakeCounted<TransportStandIn>(m_transportGone, [](const Request &) { return "fault:refused"; });
-  const Outcome outcome;
+  const OperationOutcome outcome;
   GetParam().start(*ServiceOn(transport), std::make_shared<CountingToken>(), outcome);
   transport.reset();
   ASSERT_TRUE(m_transportGone->WaitFor(1));
@@ -206,7 +150,7 @@ TEST_P(EachAsyncOperation, LetsAnExceptionOfAnotherKindLeaveThePoolsItemWithoutC
   const Testing::ScopedLogLevel level(63);
   auto transport = MakeCounted<TransportStandIn>(
       m_transportGone, [](const Request &) -> std::string { throw std::range_error("not ours"); });
-  const Outcome outcome;
+  const OperationOutcome outcome;
   GetParam().start(*ServiceOn(transport), std::make_shared<CountingToken>(), outcome);
   transport.reset();
   ASSERT_TRUE(m_transportGone->WaitFor(1));
@@ -224,13 +168,13 @@ std::shared_ptr<SecurityTokenServiceImpl> ServiceThatAnswers(const std::string &
 }
 
 TEST(ValidateSubjectAsync, ReportsAnInvalidTokenAsAVerdictAndNotAsAFailure) {
-  const Outcome outcome;
+  const OperationOutcome outcome;
   ServiceThatAnswers("valid:false")->ValidateSubjectAsync(std::make_shared<CountingToken>(), outcome.ForValidity());
   EXPECT_EQ(outcome.Wait(), Texts{"false"});
 }
 
 TEST(AcquireTokenAsync, ReportsNullAndNoExceptionWhenTheResponseHoldsNoToken) {
-  const Outcome outcome;
+  const OperationOutcome outcome;
   ServiceThatAnswers("issued:")->AcquireTokenAsync("alice", "pass", SpecFor(60), outcome.ForToken());
   EXPECT_EQ(outcome.Wait(), Texts{"null"});
 }
@@ -238,12 +182,12 @@ TEST(AcquireTokenAsync, ReportsNullAndNoExceptionWhenTheResponseHoldsNoToken) {
 TEST(AsyncOperations, ReportAMissingTokenOrHandlerAsABadArgument) {
   const auto service = ServiceThatAnswers("issued:");
   const std::string failure = "and argument: Invalid argument : a required object may not be NULL";
-  const Outcome tokens;
+  const OperationOutcome tokens;
   service->AcquireTokenByTokenAsync(nullptr, SpecFor(60), tokens.ForToken());
   service->RenewTokenAsync(nullptr, 60, tokens.ForToken());
   service->AcquireTokenByGssAsync(SpecFor(60), nullptr, tokens.ForToken());
   EXPECT_EQ(tokens.Wait(3), Texts(3, "null " + failure));
-  const Outcome verdict;
+  const OperationOutcome verdict;
   service->ValidateSubjectAsync(nullptr, verdict.ForValidity());
   EXPECT_EQ(verdict.Wait(), Texts{"empty " + failure});
 }
@@ -265,7 +209,7 @@ TEST(AsyncOperations, AreLoggedByThePoolWhenTheCompletionThrowsAndThePoolGoesOn)
   const std::string line = "Tarvel 8 An exception left a work item of the thread pool: SsoClient::SsoException: ";
   EXPECT_EQ(log.Lines(), (Texts{line + "thrown on success", line + "thrown on failure"}));
   EXPECT_EQ(calls->Get(), 2); // a Tarvel exception of the completion's own is not reported to it again
-  const Outcome outcome;
+  const OperationOutcome outcome;
   service->AcquireTokenByCertificateAsync(SpecFor(60), outcome.ForToken());
   EXPECT_EQ(outcome.Wait(), Texts{"null"});
 }
@@ -292,7 +236,7 @@ TEST(AsyncOperations, CompleteAThousandThatWereInFlightWhenTheServiceStalled) {
     return lifetime == "0" ? std::string("fault:refused") : "issued:";
   });
   auto service = ServiceOn(transport);
-  const Outcome outcome;
+  const OperationOutcome outcome;
   for (int i = 0; i < OPERATIONS; ++i) {
     service->AcquireTokenAsync("alice", "pass", SpecFor(i % 10), outcome.ForToken());
   }

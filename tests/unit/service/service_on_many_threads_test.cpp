@@ -3,6 +3,7 @@
 #include "exchange/response_handler_impl.h"
 #include "support/counting_token.h"
 #include "support/identity.h"
+#include "support/operations_in_turn.h"
 #include "support/process_resources.h"
 #include "support/service_stand_ins.h"
 #include "support/soap_responses.h"
@@ -12,18 +13,15 @@
 #include <gtest/gtest.h>
 
 #include <atomic>
-#include <functional>
 #include <memory>
 #include <stdexcept>
 #include <string>
-#include <thread>
 #include <utility>
-#include <vector>
 
 namespace SsoClient {
 namespace {
 
-constexpr int THREADS = 16;
+using Testing::OperationsInTurn;
 
 /// How much more may be allocated at the end: the heap's own bookkeeping varies. A leak of four bytes in each of 20,000
 /// operations would be more.
@@ -66,78 +64,16 @@ private:
   mutable std::atomic<int> m_openSessions{0};
 };
 
-/// Runs `operation` that often in all, on 16 threads that begin together. Returns how many threw.
-int RunOnManyThreads(int count, const std::function<void(int)> &operation) {
-  std::atomic<int> ready{0};
-  std::atomic<int> failures{0};
-  std::vector<std::thread> threads;
-  for (int thread = 0; thread < THREADS; ++thread) {
-    threads.emplace_back([&, thread] {
-      for (++ready; ready < THREADS;) {
-        std::this_thread::yield();
-      }
-      for (int i = thread; i < count; i += THREADS) {
-        try {
-          operation(i);
-        } catch (...) {
-          ++failures;
-        }
-      }
-    });
-  }
-  for (std::thread &thread : threads) {
-    thread.join();
-  }
-  return failures;
-}
-
-/// Runs all operations in turn on one service.
-class OperationsInTurn {
-public:
-  /// @param subject whose token each operation is to yield; null for none. @param held a token to exchange, validate, renew
-  OperationsInTurn(const SecurityTokenService &service, const char *subject, const SamlToken &held)
-      : m_service(service), m_subject(subject), m_held(held) {}
-
-  void Run(int i) {
-    switch (i % 5) {
-    case 0:
-      return Judge(m_service.AcquireToken("alice@corp.example", "pass", m_spec));
-    case 1:
-      return Judge(m_service.AcquireTokenByCertificate(m_spec));
-    case 2:
-      return Judge(m_service.AcquireTokenByToken(m_held, m_spec));
-    case 3:
-      m_wrong += m_service.ValidateSubject(m_held) ? 0 : 1;
-      return;
-    default:
-      return Judge(m_service.RenewToken(m_held, 60));
-    }
-  }
-
-  int CountWrongResults() const { return m_wrong; }
-
-private:
-  void Judge(const std::shared_ptr<const SamlToken> &token) {
-    const bool isRight = m_subject ? token && token->GetSubject().name == m_subject : !token;
-    m_wrong += isRight ? 0 : 1;
-  }
-
-  const SecurityTokenService &m_service;
-  const char *const m_subject;
-  const SamlToken &m_held;
-  const TokenSpec m_spec = Testing::SpecFor(60);
-  std::atomic<int> m_wrong{0};
-};
-
 /// Expects `count` operations to succeed and to leave nothing behind.
 void ExpectNoErrorAndNoGrowth(int count, OperationsInTurn &operations, const ForgetfulTransport &transport) {
   constexpr int FIRST = 320; // after which whatever is made once is there
-  const auto run = [&](int i) { operations.Run(i); };
-  ASSERT_EQ(RunOnManyThreads(FIRST, run), 0);
+  operations.RunOnSixteenThreads(FIRST);
+  ASSERT_EQ(operations.GetFailure(), "");
   const std::size_t bytes = Testing::CountAllocatedBytes();
   const std::size_t descriptors = Testing::CountDescriptors();
-  EXPECT_EQ(RunOnManyThreads(count, run), 0);
-  EXPECT_EQ(operations.CountWrongResults(), 0);
+  operations.RunOnSixteenThreads(count);
+  EXPECT_EQ(operations.GetFailure(), "");
+  EXPECT_EQ(operations.CountSuccesses(), FIRST + count);
   EXPECT_EQ(transport.CountSessions(), FIRST + count);
   EXPECT_EQ(transport.CountOpenSessions(), 0);
   EXPECT_EQ(Testing::CountDescriptors(), descriptors);
