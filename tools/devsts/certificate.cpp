@@ -30,7 +30,7 @@ std::vector<unsigned char> DerOf(const X509 &certificate) {
   if (length < 0) {
     throw std::bad_alloc();
   }
-  const std::vector<unsigned char> copy(der, der + length);
+  std::vector<unsigned char> copy(der, der + length);
   OPENSSL_free(der);
   return copy;
 }
@@ -43,7 +43,7 @@ std::string OnlyEntry(const X509_NAME *name, int kind) {
   }
   unsigned char *text = nullptr;
   const int length = ASN1_STRING_to_UTF8(&text, X509_NAME_ENTRY_get_data(X509_NAME_get_entry(name, at)));
-  const std::string copy(reinterpret_cast<const char *>(text), length > 0 ? static_cast<std::size_t>(length) : 0);
+  std::string copy(reinterpret_cast<const char *>(text), length > 0 ? static_cast<std::size_t>(length) : 0);
   OPENSSL_free(text);
   return copy;
 }

@@ -61,7 +61,8 @@ std::string TextsOf(OM_uint32 code, int kind) {
     if (GSS_ERROR(gss_display_status(&minor, code, kind, Spnego(), &rest, text.Slot())) != 0) {
       break;
     }
-    all += (all.empty() ? "" : "; ") + std::string(text.Text().c_str()); // without a null that some texts end with
+    const std::string words = text.Text();
+    all += (all.empty() ? "" : "; ") + words.substr(0, words.find('\0')); // some texts end with a null
   }
   return all;
 }

@@ -20,6 +20,10 @@ namespace {
 
 constexpr int MAX_DESCRIPTOR = 65535;
 
+[[noreturn]] void ThrowUnread(const std::string &place, const std::string &reason) {
+  throw Tarvel::IOException(place + ": " + reason);
+}
+
 /// Reads octet by octet, so that what follows the line stays for whoever reads on.
 /// @throws Tarvel::IOException naming `place`.
 Secret ReadLine(int descriptor, const std::string &place, const std::string &secretName) {
@@ -32,10 +36,10 @@ Secret ReadLine(int descriptor, const std::string &place, const std::string &sec
       continue;
     }
     if (count < 0) {
-      throw Tarvel::IOException(place + ": " + std::strerror(errno));
+      ThrowUnread(place, std::strerror(errno));
     }
     if (count == 0 && isEmpty) {
-      throw Tarvel::IOException(place + ": there is no " + secretName);
+      ThrowUnread(place, "there is no " + secretName);
     }
     if (count == 0 || octet == '\n') {
       return secret;
