@@ -65,6 +65,7 @@ void Start(Process &process, std::vector<std::string> arguments, const std::stri
     dup2(process.in.readEnd, STDIN_FILENO);
     dup2(process.out.writeEnd, STDOUT_FILENO);
     dup2(process.err.writeEnd, STDERR_FILENO);
+    HeedSignals();
     if (chdir(folder.c_str()) == 0) {
       execv(raw[0], raw.data());
     }
@@ -136,6 +137,12 @@ bool Catches(pid_t id, int signal) {
 }
 
 } // namespace
+
+void HeedSignals() {
+  for (const int signal : {SIGINT, SIGQUIT, SIGPIPE}) {
+    std::signal(signal, SIG_DFL);
+  }
+}
 
 std::vector<std::string> ToolCommand(const std::vector<std::string> &arguments) {
   std::vector<std::string> all = {SSOCLIENT_TOOL};

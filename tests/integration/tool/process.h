@@ -15,6 +15,10 @@ struct Result {
   std::string err;
 };
 
+/// For a new process before it becomes another program: signals do what they do in a shell's foreground. Whoever started
+/// the tests may ignore some, as a shell does for its background work, and a program inherits that.
+void HeedSignals();
+
 /// The words that start the tool with `arguments`.
 std::vector<std::string> ToolCommand(const std::vector<std::string> &arguments);
 

@@ -1,6 +1,8 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "terminal.h"
 
+#include "process.h"
+
 #include <array>
 #include <csignal>
 #include <fstream>
@@ -34,6 +36,7 @@ TerminalSession::TerminalSession(std::vector<std::string> words, const std::stri
   if (m_process == 0) {
     close(m_master);
     login_tty(m_slave);
+    HeedSignals();
     if (chdir(folder.c_str()) == 0) {
       execv(raw[0], raw.data());
     }
