@@ -160,9 +160,10 @@ void SecurityTokenServiceImpl::ContinueSPNegotiation(TransportSession &session, 
   SendLeg(session, request, spnego);
 }
 
-Ref<Tarvel::Reader> SecurityTokenServiceImpl::Send(Request request) const {
+Ref<Tarvel::Reader> SecurityTokenServiceImpl::Send(Request &&request) const {
+  const Request ours = std::move(request); // which is overwritten when we return
   Ref<Tarvel::Reader> response;
-  m_transport->CreateSession()->SendRequest(request, response);
+  m_transport->CreateSession()->SendRequest(ours, response);
   return response;
 }
 

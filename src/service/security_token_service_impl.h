@@ -65,7 +65,7 @@ public:
 private:
   /// Posts on a session of its own. Session and request are gone when this returns, so that no password in the request
   /// waits until the response has been judged.
-  Tarvel::Ref<Tarvel::Reader> Send(Request request) const;
+  Tarvel::Ref<Tarvel::Reader> Send(Request &&request) const;
   void SendLeg(TransportSession &session, const Request &request, SPNegoResponse &spnego) const;
   /// Exchanges legs until the service issues a token or something throws.
   void Negotiate(const TokenSpec &spec, NegotiationHandler &handler, SPNegoResponse &spnego) const;
