@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// What the test process holds: open descriptors, threads and memory.
+/// What the test process holds: open descriptors and threads.
 
 #pragma once
 
@@ -10,7 +10,6 @@
 #include <cstddef>
 #include <filesystem>
 #include <iterator>
-#include <malloc.h>
 #include <thread>
 
 namespace Testing {
@@ -31,29 +30,21 @@ inline std::size_t CountThreads() {
   return CountEntries("/proc/self/task");
 }
 
-/// Whether this is a build under AddressSanitizer or ThreadSanitizer, where everything takes many times as long.
+// Whether this is a build under AddressSanitizer or ThreadSanitizer; g++ and clang say so in different words.
 #if defined(__SANITIZE_ADDRESS__) || defined(__SANITIZE_THREAD__)
-constexpr bool IS_SANITIZED = true;
+#define TESTING_IS_SANITIZED 1
 #elif defined(__has_feature)
 #if __has_feature(address_sanitizer) || __has_feature(thread_sanitizer)
+#define TESTING_IS_SANITIZED 1
+#endif
+#endif
+
+/// Under a sanitizer everything takes many times as long.
+#ifdef TESTING_IS_SANITIZED
 constexpr bool IS_SANITIZED = true;
 #else
 constexpr bool IS_SANITIZED = false;
 #endif
-#else
-constexpr bool IS_SANITIZED = false;
-#endif
-
-/// How much is allocated on the heap, in all threads. What the allocator keeps to hand it out again does not count, but
-/// for a few pieces at hand in each living thread. A sanitizer's allocator tells nothing here: always 0 then, and
-/// AddressSanitizer's own check for leaks at the program's end stands in.
-inline std::size_t CountAllocatedBytes() {
-  if (IS_SANITIZED) {
-    return 0;
-  }
-  const struct mallinfo2 heap = ::mallinfo2();
-  return heap.uordblks + heap.hblkhd;
-}
 
 /// Whether `condition` comes true in bounded time. For what ends in the kernel, which notifies nobody.
 template <typename Condition>

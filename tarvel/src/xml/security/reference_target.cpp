@@ -63,63 +63,59 @@ const Node *NextInDocument(const Node *node, const Node *top) {
   return node == top ? nullptr : node->GetNextSibling();
 }
 
-struct Search {
-  std::string_view uri;
-  std::string_view identifier;
-  const Node **target;
-};
-
-void NoteMatches(const ElementNode &element, const std::vector<Search> &searches) {
-  for (const Search &search : searches) {
-    if (!HasIdentifier(element, search.identifier)) {
-      continue;
-    }
-    if (*search.target) {
-      Refuse(search.uri, "several elements have that identifier");
-    }
-    *search.target = &element;
-  }
-}
-
 /// The index of the first of the `uris` that is the one at `index`.
 std::size_t FirstEqual(const std::vector<std::string_view> &uris, std::size_t index) {
   return static_cast<std::size_t>(std::find(uris.begin(), uris.end(), uris[index]) - uris.begin());
 }
 
-void RequireFound(const Search &search, const ElementNode &root) {
-  if (!*search.target) {
-    Refuse(search.uri, "no element has that identifier");
+void NoteMatches(const ElementNode &element, const std::vector<std::string_view> &uris,
+                 std::vector<IdentifierSearch> &searches) {
+  for (IdentifierSearch &search : searches) {
+    if (!HasIdentifier(element, search.identifier)) {
+      continue;
+    }
+    if (search.target) {
+      Refuse(uris[search.reference], "several elements have that identifier");
+    }
+    search.target = &element;
   }
-  if (HasIdentifier(root, search.identifier) && *search.target != &root) {
-    Refuse(search.uri, "it means another element than the one that the signature is to cover");
+}
+
+void RequireFound(const IdentifierSearch &search, std::string_view uri, const ElementNode &root) {
+  if (!search.target) {
+    Refuse(uri, "no element has that identifier");
+  }
+  if (HasIdentifier(root, search.identifier) && search.target != &root) {
+    Refuse(uri, "it means another element than the one that the signature is to cover");
   }
 }
 
 } // namespace
 
-std::vector<const Node *> ResolveReferences(const ElementNode &root, const std::vector<std::string_view> &uris) {
-  const Node *top = root.GetRoot();
-  std::vector<const Node *> targets(uris.size(), nullptr);
-  std::vector<Search> searches;
+std::vector<IdentifierSearch> PlanSearches(const std::vector<std::string_view> &uris) {
+  std::vector<IdentifierSearch> searches;
   for (std::size_t index = 0; index < uris.size(); ++index) {
-    if (uris[index].empty()) {
-      targets[index] = top;
-      continue;
-    }
-    // Each identifier is searched for once, however many references repeat it.
-    if (FirstEqual(uris, index) == index) {
-      searches.push_back({uris[index], RequireIdentifier(uris[index]), &targets[index]});
+    if (!uris[index].empty() && FirstEqual(uris, index) == index) {
+      searches.push_back({RequireIdentifier(uris[index]), index});
     }
   }
+  return searches;
+}
+
+std::vector<const Node *> ResolveReferences(const ElementNode &root, const std::vector<std::string_view> &uris) {
+  const Node *top = root.GetRoot();
+  std::vector<IdentifierSearch> searches = PlanSearches(uris);
   if (!searches.empty()) {
     for (const Node *node = top; node; node = NextInDocument(node, top)) {
       if (const ElementNode *element = AsElement(node)) {
-        NoteMatches(*element, searches);
+        NoteMatches(*element, uris, searches);
       }
     }
   }
-  for (const Search &search : searches) {
-    RequireFound(search, root);
+  std::vector<const Node *> targets(uris.size(), top);
+  for (const IdentifierSearch &search : searches) {
+    RequireFound(search, uris[search.reference], root);
+    targets[search.reference] = search.target;
   }
   for (std::size_t index = 0; index < uris.size(); ++index) {
     targets[index] = targets[FirstEqual(uris, index)];

@@ -1,0 +1,77 @@
+// SPDX-License-Identifier: Apache-2.0
+/// @file
+/// How much of the heap the process holds, to the byte. This header replaces the allocation functions of the C library by
+/// ones that count, for all libraries of the program too: exactly one source file of a program includes it.
+
+#pragma once
+
+#include "support/process_resources.h"
+
+#include <malloc.h>
+
+#include <atomic>
+#include <cerrno>
+#include <cstddef>
+#include <cstdlib>
+
+namespace Testing {
+
+/// What malloc and its kin have handed out to all threads and not got back. A sanitizer has an allocator of its own, which
+/// is not replaced: always 0 then, and AddressSanitizer's check for leaks at the program's end stands in.
+inline std::atomic<std::size_t> &AllocatedBytes() {
+  static std::atomic<std::size_t> bytes{0};
+  return bytes;
+}
+
+inline std::size_t CountAllocatedBytes() {
+  return AllocatedBytes();
+}
+
+} // namespace Testing
+
+#ifndef TESTING_IS_SANITIZED
+#pragma GCC visibility push(default) // for the shared libraries
+// What the C library's own functions are also called, so that those that replace them can use them.
+extern "C" {
+void *__libc_malloc(std::size_t size);
+void *__libc_calloc(std::size_t count, std::size_t size);
+void *__libc_realloc(void *memory, std::size_t size);
+void *__libc_memalign(std::size_t alignment, std::size_t size);
+void __libc_free(void *memory);
+
+static void *CountAllocated(void *memory) {
+  Testing::AllocatedBytes() += ::malloc_usable_size(memory);
+  return memory;
+}
+
+void *malloc(std::size_t size) noexcept {
+  return CountAllocated(__libc_malloc(size));
+}
+void *calloc(std::size_t count, std::size_t size) noexcept {
+  return CountAllocated(__libc_calloc(count, size));
+}
+void *memalign(std::size_t alignment, std::size_t size) noexcept {
+  return CountAllocated(__libc_memalign(alignment, size));
+}
+void *aligned_alloc(std::size_t alignment, std::size_t size) noexcept {
+  return CountAllocated(__libc_memalign(alignment, size));
+}
+int posix_memalign(void **memory, std::size_t alignment, std::size_t size) noexcept {
+  *memory = CountAllocated(__libc_memalign(alignment, size));
+  return *memory ? 0 : ENOMEM;
+}
+void *realloc(void *memory, std::size_t size) noexcept {
+  const std::size_t before = ::malloc_usable_size(memory);
+  void *const after = __libc_realloc(memory, size);
+  if (after || size == 0) {
+    Testing::AllocatedBytes() -= before;
+  }
+  return CountAllocated(after);
+}
+void free(void *memory) noexcept {
+  Testing::AllocatedBytes() -= ::malloc_usable_size(memory);
+  __libc_free(memory);
+}
+}
+#pragma GCC visibility pop
+#endif
