@@ -19,7 +19,8 @@ struct SSOCLIENT_API PrincipalId {
   std::string ToString() const;
 };
 
-/// Equality ignores letter case, in the name and in the domain.
+/// Equality ignores letter case, in the name and in the domain: it compares the upper-case forms by Unicode's simple
+/// mapping. A few distinct letters share one, as dotless i and i, or long s and s, and are the same here.
 SSOCLIENT_API bool operator==(const PrincipalId &left, const PrincipalId &right);
 SSOCLIENT_API bool operator!=(const PrincipalId &left, const PrincipalId &right);
 

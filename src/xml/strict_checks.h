@@ -48,7 +48,7 @@ void RequireElementAttributesQNames(const Tarvel::Xml::ElementNode &element,
                                     const std::vector<Tarvel::Xml::QName> &optional);
 
 /// The element that the cursor stands on must hold one text and nothing else. Two texts with a comment between them are
-/// two: a value cannot be cut short by a comment.
+/// two: a comment cannot cut a value short. It can only cut off white space at either end, which alone is no text here.
 void RequireTextualContent(NodeFilterIterator iterator, std::string &text);
 
 /// The value of an attribute without a prefix; empty when it is not there.

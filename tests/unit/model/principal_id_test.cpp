@@ -19,6 +19,12 @@ TEST(PrincipalIdEquality, IgnoresLetterCaseBeyondAscii) {
   EXPECT_TRUE((PrincipalId{"j\u00fcrgen", "corp"} == PrincipalId{"J\u00dcRGEN", "CORP"}));
 }
 
+TEST(PrincipalIdEquality, JoinsDistinctLettersOfOneUpperCaseForm) {
+  EXPECT_TRUE((PrincipalId{"\u0131ris", "corp"} == PrincipalId{"iris", "corp"}));     // dotless i
+  EXPECT_TRUE((PrincipalId{"alice", "\u017fales"} == PrincipalId{"alice", "sales"})); // long s
+  EXPECT_FALSE((PrincipalId{"\u0130ris", "corp"} == PrincipalId{"iris", "corp"}));    // I with a dot stays itself
+}
+
 TEST(PrincipalIdEquality, TellsOtherNamesAndDomainsApart) {
   const PrincipalId alice{"alice", "corp"};
   EXPECT_FALSE((alice == PrincipalId{"bob", "corp"}));
