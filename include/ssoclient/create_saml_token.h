@@ -25,7 +25,9 @@ constexpr std::int64_t DEFAULT_CLOCK_TOLERANCE_SEC = 600;
 ///        which a token is accepted.
 /// @throws Tarvel::Xml::XMLParseException when `xml` is not a well-formed document.
 /// @throws ParseException when it is not an assertion of the accepted form, is inconsistent, expired or not valid yet.
-/// @throws InvalidSignatureException when none of the trusted keys made its signature, or it was changed since.
+/// @throws InvalidSignatureException when none of the trusted keys made its signature, when it was changed since, or
+///         when the signature is outside the accepted profile: another algorithm, more than ten references, an
+///         identifier that no element bears, or more than one.
 SSOCLIENT_API std::shared_ptr<const SamlToken>
 CreateSamlToken(const std::string &xml, const Tarvel::Crypto::CertificateList &trustedCertificates,
                 std::int64_t clockToleranceSec);

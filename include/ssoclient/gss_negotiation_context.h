@@ -30,9 +30,8 @@ class SSOCLIENT_API GssNegotiationContext {
 public:
   /// Sends the client's leg and waits, up to 40 seconds, for the service's answer.
   /// @param leg the caller's GSS output token; may be empty.
-  /// @throws InvalidCredentialsException, CommunicationException, SsoException and InvalidSignatureException as the
-  ///         operations of `SecurityTokenService`, but ParseException for a token that is malformed, expired or not valid
-  ///         yet. After an exception the negotiation stands where the last answered leg left it.
+  /// @throws what the operations of `SecurityTokenService` throw, but ParseException for a token that is malformed,
+  ///         expired or not valid yet. After an exception the negotiation stands where the last answered leg left it.
   virtual GssNegotiationResult NegotiateToken(const std::vector<std::uint8_t> &leg) = 0;
 
 protected:
@@ -46,7 +45,7 @@ protected:
 /// yet. Both are copied from; the configuration's SSL context must outlive the result. `useDomainControllerName` does not
 /// count here.
 /// @throws Tarvel::InvalidArgumentException without signing certificates, and for an HTTPS address without an SSL context.
-///         A malformed address raises what the platform's URL parser raises.
+/// @throws Tarvel::Http::MalformedURLException for a malformed address.
 SSOCLIENT_API std::shared_ptr<GssNegotiationContext>
 CreateGssNegotiationContext(const SecurityTokenServiceConfig &config, const TokenSpec &spec);
 

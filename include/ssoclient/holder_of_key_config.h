@@ -12,7 +12,7 @@ namespace SsoClient {
 
 /// A private key and its certificate, both shared with every copy; the certificate is released first, then the key.
 struct HolderOfKeyConfig {
-  Tarvel::Ref<const Tarvel::Crypto::PrivateKey> privateKey;   ///< signs requests
+  Tarvel::Ref<const Tarvel::Crypto::PrivateKey> privateKey;   ///< signs requests, by RSA-SHA256: an RSA key
   Tarvel::Ref<const Tarvel::Crypto::Certificate> certificate; ///< sent with signed requests
 };
 

@@ -29,8 +29,10 @@ namespace SsoClient {
 /// - `InvalidSignatureException` when none of the trusted certificates' keys signed the token,
 /// - `SsoException` for every other fault, for a response that is not of the expected form, and for a token that is
 ///   malformed, expired or not valid yet,
-/// - `Tarvel::InvalidArgumentException` for a lifetime that is not positive and for a text that XML cannot carry,
+/// - `Tarvel::InvalidArgumentException` for a lifetime that is not positive, for a text that XML cannot carry, for a
+///   confirmation other than the default where a token is acquired by certificate, and for a bearer token to renew,
 ///   `Tarvel::InvalidStateException` where a holder-of-key identity is needed and none is configured,
+/// - `Tarvel::Xml::Security::XmlSecurityException` for an identity whose key cannot sign with RSA-SHA256 (an EC key),
 /// - `Tarvel::Xml::Security::XmlSecurityException` or `Tarvel::Xml::XMLParseException` for an assertion in the response
 ///   that cannot be taken out of it as a document of its own.
 /// All of them are `Tarvel::Exception`. Nothing is tried again. A token that is returned is never null.
@@ -101,8 +103,8 @@ protected:
 
 /// A client of the service that `config` describes. Nothing is connected or sent yet. `config` is copied from; its SSL
 /// context must outlive the service.
-/// @throws Tarvel::InvalidArgumentException for an HTTPS address without an SSL context. A malformed address raises what
-///         the platform's URL parser raises.
+/// @throws Tarvel::InvalidArgumentException for an HTTPS address without an SSL context.
+/// @throws Tarvel::Http::MalformedURLException for a malformed address.
 SSOCLIENT_API std::shared_ptr<SecurityTokenService>
 CreateSecurityTokenService(const SecurityTokenServiceConfig &config);
 

@@ -22,11 +22,21 @@ public:
   /// Called once, on an I/O thread, with the stream and null, or with an exception; the stream may be given then too.
   using ConnectCompletion = std::function<void(const Ref<System::Stream> &, const Exception *)>;
 
+  /// One line for logs. The platform does not read it.
   virtual std::string ToString() const = 0;
+
+  /// The host that is asked, for the Host header and the cookies; an IPv6 address with or without brackets.
   virtual std::string GetHost() const = 0;
+
+  /// "host:port", for messages. The port, behind the last colon, goes into the Host header as well.
   virtual std::string GetEndpointString() const = 0;
+
+  /// Whether a connection may serve on after an authentication has failed on it. The user agent here, which opens one
+  /// connection for each request, does not ask.
   virtual bool IsReuseOnAuthErrorSupported() const = 0;
-  /// Starts to connect. The returned item cancels the attempt; the completion then gets an exception.
+
+  /// Starts to connect. The returned item cancels the attempt; the completion then gets an exception. What goes wrong
+  /// is for the completion, as a rule in a `System::NetworkException`, of which `Ssl::SSLException` is one.
   virtual Ref<System::ScheduledItem> AsyncConnect(ConnectCompletion completion) const = 0;
 
 protected:

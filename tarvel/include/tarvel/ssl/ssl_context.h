@@ -25,6 +25,8 @@ class TARVEL_API SSLException : public System::NetworkException {
 /// A TLS layer over a connected stream.
 class TARVEL_API SSLStream : public System::Stream {
 public:
+  /// Called once, on an I/O thread, with null or with what went wrong, which is valid during the call: an
+  /// `SSLException`, also when the stream below failed, or an `InvalidStateException` for a second handshake.
   using HandshakeHandler = std::function<void(const Exception *)>;
 
   /// Shakes hands as a client. `host` is sent as the server name (unless it is an address) and the server's certificate
@@ -48,6 +50,7 @@ public:
   virtual void TrustSystemStore() = 0;
   /// Adds the certificates of a PEM file. @throws IOException, Crypto::CryptoException
   virtual void TrustFile(const std::string &path) = 0;
+  /// Adds certificates, none of them null; each is trusted by itself, root or not. @throws Crypto::CryptoException
   virtual void TrustCertificates(const Crypto::CertificateList &certificates) = 0;
 
   /// The certificate to show when the server asks for one, with its key and the certificates between it and the root.
@@ -64,7 +67,7 @@ protected:
   ~SSLContext() override;
 };
 
-/// A context that trusts nothing yet.
+/// A context that trusts nothing yet. @throws Crypto::CryptoException
 TARVEL_API Ref<SSLContext> CreateSSLContext();
 
 } // namespace Ssl

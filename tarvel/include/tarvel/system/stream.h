@@ -28,11 +28,14 @@ class TARVEL_API TimeoutException : public NetworkException {
 };
 
 /// A connected stream of bytes, driven asynchronously. Completions run on the platform's I/O threads, exactly once for
-/// each start, never inside the starting call (though perhaps before it has returned). At most one read and one write may be pending at a time. Buffers
-/// belong to the caller and must stay until the completion. Any thread may start and close.
+/// each start, never inside the starting call (though perhaps before it has returned). At most one read and one write
+/// may be pending at a time. Buffers belong to the caller and must stay until the completion. Any thread may start and
+/// close.
 class TARVEL_API Stream : public Object {
 public:
-  /// Called with the number of bytes moved and null, or with what went wrong. The exception is valid during the call.
+  /// Called with the number of bytes moved and null, or with what went wrong, which is valid during the call: a
+  /// `NetworkException`, over TLS its `Ssl::SSLException`; `InvalidArgumentException` or `InvalidStateException` for a
+  /// read of no bytes and, over TLS, for a second read or write while one is pending and for one before the handshake.
   using TransferHandler = std::function<void(std::size_t, const Exception *)>;
 
   /// Reads at least one byte, at most `length`; 0 bytes and no exception mean the peer's orderly end.
@@ -51,10 +54,13 @@ protected:
 /// A TCP connection to be made.
 class TARVEL_API TcpClientSocket : public Stream {
 public:
+  /// Called with null, or with what went wrong, which is valid during the call: a `NetworkException`, or an
+  /// `InvalidStateException` for a socket that has been used or closed already.
   using ConnectHandler = std::function<void(const Exception *)>;
 
   /// Resolves `host` (a name, or an IPv4 or IPv6 address, this one with or without brackets) and connects, trying each
-  /// address in the resolver's order until one answers. Names that are not ASCII are refused.
+  /// address in the resolver's order until one answers. Names that are not ASCII are refused, and ports outside 1 to
+  /// 65535, by a `NetworkException` to the handler.
   virtual void AsyncConnect(const std::string &host, int port, ConnectHandler handler) = 0;
 
 protected:
@@ -62,6 +68,7 @@ protected:
 };
 
 /// A socket, not connected. Its completions run on the platform's I/O threads.
+/// @throws InvalidStateException when these cannot be started.
 TARVEL_API Ref<TcpClientSocket> CreateTcpClientSocket();
 
 /// A handle that cancels by closing `stream`.

@@ -50,7 +50,8 @@ public:
   /// The references in document order.
   virtual const std::vector<Reference> &GetReferences() const noexcept = 0;
 
-  /// Checks the digest of every reference, then the signature over `SignedInfo` with each candidate key until one fits.
+  /// Checks the signature over `SignedInfo` with each candidate key until one fits, and then the digest of every
+  /// reference: only a signer may ask for that work.
   /// @param signedUris receives the URIs of the references when the answer is true, and is left alone otherwise.
   /// @return false when a digest or the signature value is wrong.
   /// @throws XmlSecurityException for an algorithm outside the profile, a reference that does not resolve to exactly one
