@@ -1,7 +1,7 @@
 # SPDX-License-Identifier: Apache-2.0
 # What `cmake --install` puts where: both libraries, their public headers, the CMake package and the pkg-config files.
-# Components: "runtime" (what a program needs to run), "development" (what one needs to build it), "tools"; "gssapi" and
-# "gssapi-development" for the negotiation handler.
+# Components: "runtime" (what a program needs to run), "development" (what one needs to build it, and the documentation),
+# "tools"; "gssapi" and "gssapi-development" for the negotiation handler.
 
 include(CMakePackageConfigHelpers)
 
@@ -57,4 +57,7 @@ if(TARGET ssoclient_gssapi)
 endif()
 
 install(FILES docs/man/ssoclient.1 DESTINATION ${CMAKE_INSTALL_MANDIR}/man1 COMPONENT tools)
-install(FILES LICENSE README.md CHANGELOG.md DESTINATION ${CMAKE_INSTALL_DOCDIR} COMPONENT runtime)
+install(FILES LICENSE CHANGELOG.md DESTINATION ${CMAKE_INSTALL_DOCDIR} COMPONENT runtime)
+# The README together with what it points to.
+install(FILES README.md CONTRIBUTING.md SECURITY.md DESTINATION ${CMAKE_INSTALL_DOCDIR} COMPONENT development)
+install(DIRECTORY docs examples DESTINATION ${CMAKE_INSTALL_DOCDIR} COMPONENT development)
