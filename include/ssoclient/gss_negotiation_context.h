@@ -44,7 +44,8 @@ protected:
 /// A negotiation for a token as `spec` asks for, with the service that `config` describes. Nothing is connected or sent
 /// yet. Both are copied from; the configuration's SSL context must outlive the result. `useDomainControllerName` does not
 /// count here.
-/// @throws Tarvel::InvalidArgumentException without signing certificates, and for an HTTPS address without an SSL context.
+/// @throws Tarvel::InvalidArgumentException without signing certificates, for an HTTPS address without an SSL context, and
+///         for an identity without key or certificate.
 /// @throws Tarvel::Http::MalformedURLException for a malformed address.
 SSOCLIENT_API std::shared_ptr<GssNegotiationContext>
 CreateGssNegotiationContext(const SecurityTokenServiceConfig &config, const TokenSpec &spec);

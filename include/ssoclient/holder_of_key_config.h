@@ -10,7 +10,8 @@
 
 namespace SsoClient {
 
-/// A private key and its certificate, both shared with every copy; the certificate is released first, then the key.
+/// A private key and its certificate, both shared with every copy; the certificate is released first, then the key. A
+/// service or a negotiation is not created with one that lacks either.
 struct HolderOfKeyConfig {
   Tarvel::Ref<const Tarvel::Crypto::PrivateKey> privateKey;   ///< signs requests, by RSA-SHA256: an RSA key
   Tarvel::Ref<const Tarvel::Crypto::Certificate> certificate; ///< sent with signed requests

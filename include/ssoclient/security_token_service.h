@@ -103,7 +103,8 @@ protected:
 
 /// A client of the service that `config` describes. Nothing is connected or sent yet. `config` is copied from; its SSL
 /// context must outlive the service.
-/// @throws Tarvel::InvalidArgumentException for an HTTPS address without an SSL context.
+/// @throws Tarvel::InvalidArgumentException for an HTTPS address without an SSL context, and for an identity without key or
+///         certificate.
 /// @throws Tarvel::Http::MalformedURLException for a malformed address.
 SSOCLIENT_API std::shared_ptr<SecurityTokenService>
 CreateSecurityTokenService(const SecurityTokenServiceConfig &config);

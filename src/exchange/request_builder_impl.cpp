@@ -38,7 +38,11 @@ void SetBody(Request &request, std::string body) {
 } // namespace
 
 RequestBuilderImpl::RequestBuilderImpl(const boost::optional<HolderOfKeyConfig> &holderOfKeyConfig)
-    : m_holderOfKeyConfig(holderOfKeyConfig) {}
+    : m_holderOfKeyConfig(holderOfKeyConfig) {
+  if (m_holderOfKeyConfig && !(m_holderOfKeyConfig->privateKey && m_holderOfKeyConfig->certificate)) {
+    throw Tarvel::InvalidArgumentException("HolderOfKeyConfig lacks its private key or its certificate");
+  }
+}
 
 void RequestBuilderImpl::BuildUserPassTokenRequest(const std::string &username, const std::string &password,
                                                    const TokenSpec &spec, Request &request) const {

@@ -18,6 +18,7 @@ namespace SsoClient {
 class RequestBuilderImpl final : public RequestBuilder {
 public:
   /// @param holderOfKeyConfig the identity to sign with, if there is one; copied
+  /// @throws Tarvel::InvalidArgumentException for an identity without key or certificate.
   explicit RequestBuilderImpl(const boost::optional<HolderOfKeyConfig> &holderOfKeyConfig);
 
   /// Signed when the spec asks for a holder-of-key token and there is an identity, unless the token is delegated: such a

@@ -7,7 +7,12 @@
 
 #include <gtest/gtest.h>
 
+#include <algorithm>
+#include <cstddef>
+#include <cstdint>
 #include <limits>
+#include <string>
+#include <vector>
 
 namespace SsoClient {
 namespace {
@@ -77,6 +82,26 @@ TEST(AcquireSecurityTokenBuilder, WritesEveryOptionalPartInItsPlace) {
   EXPECT_EQ(SerializeToXML(AcquireSecurityTokenBuilder(SamlToken::HOLDER_OF_KEY, spec)), expected);
 }
 
+TEST(AcquireSecurityTokenBuilder, AddsNothingForAnEmptySetOfAudiencesAndAnEmptyListOfAdvice) {
+  const FixedEnvironment environment;
+  TokenSpec spec = TenMinutes();
+  spec.audienceRestriction.clear();
+  spec.advice.clear();
+  EXPECT_EQ(SerializeToXML(AcquireSecurityTokenBuilder(SamlToken::BEARER, spec)), BEARER_ISSUE + END);
+}
+
+TEST(AcquireSecurityTokenBuilder, SortsAudiencesByTheirBytes) {
+  TokenSpec spec = TenMinutes();
+  spec.audienceRestriction = {"urn:b", "urn:\xC3\xA4", "urn:B", "urn:a"};
+  const std::string request = SerializeToXML(AcquireSecurityTokenBuilder(SamlToken::BEARER, spec));
+  std::vector<std::size_t> places;
+  for (const char *audience : {">urn:B<", ">urn:a<", ">urn:b<", ">urn:\xC3\xA4<"}) {
+    places.push_back(request.find(audience));
+  }
+  EXPECT_TRUE(std::is_sorted(places.begin(), places.end()));
+  EXPECT_NE(places.back(), std::string::npos);
+}
+
 TEST(AcquireSecurityTokenBuilder, WritesADelegateWhoseNameIsEmpty) {
   const FixedEnvironment environment;
   TokenSpec spec = TenMinutes();
@@ -123,6 +148,13 @@ TEST(ValidateSecurityTokenBuilder, AsksForAStatusAndHasNoLifetime) {
 TEST(WssuLifetimeBuilder, ExpiresSixHundredSecondsAfterItWasCreated) {
   const FixedEnvironment environment;
   EXPECT_EQ(SerializeToXML(WssuLifetimeBuilder(600)), IN_TEN_MINUTES);
+}
+
+TEST(WssuLifetimeBuilder, ReadsTheClockOnce) {
+  std::int64_t now = FIXED_NOW;
+  const Tarvel::System::ScopedEnvironment environment({[&now] { return now += 1000000; }, {}});
+  WssuLifetimeBuilder(600);
+  EXPECT_EQ(now, FIXED_NOW + 1000000);
 }
 
 TEST(WssuLifetimeBuilder, CountsLifetimesBeyondThirtyTwoBits) {

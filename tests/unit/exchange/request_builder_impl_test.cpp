@@ -73,6 +73,17 @@ TEST(ValidateLifetime, RefusesZeroAndLessAndPassesOne) {
   EXPECT_NO_THROW(ValidateLifetime(1));
 }
 
+TEST(RequestBuilderImplCreation, RefusesAnIdentityWithoutKeyOrCertificate) {
+  HolderOfKeyConfig withoutKey = HolderIdentity();
+  withoutKey.privateKey = nullptr;
+  HolderOfKeyConfig withoutCertificate = HolderIdentity();
+  withoutCertificate.certificate = nullptr;
+  for (const HolderOfKeyConfig &identity : {withoutKey, withoutCertificate, HolderOfKeyConfig()}) {
+    EXPECT_THROWS_MESSAGE(RequestBuilderImpl{identity}, Tarvel::InvalidArgumentException,
+                          "Invalid argument : HolderOfKeyConfig lacks its private key or its certificate");
+  }
+}
+
 TEST(ConfOverrideWithDelegate, IsNoneForADelegatedTokenAndElseWhatTheSpecSays) {
   EXPECT_EQ(ConfOverrideWithDelegate(DelegatedSpec()), TokenSpec::CONFIRMATION_NONE);
   EXPECT_EQ(ConfOverrideWithDelegate(Spec()), TokenSpec::CONFIRMATION_DEFAULT);

@@ -134,6 +134,12 @@ TEST(CheckSoapFault, TellsThePrefixByTheDeclarationsAtTheFaultCodeAlone) {
       InvalidCredentialsException, "Authentication failed");
 }
 
+TEST(CheckSoapFault, TakesNoDefaultNamespaceForThatOfAFaultCodeWithoutPrefix) {
+  EXPECT_THROWS_MESSAGE(Acquire("<Envelope xmlns='http://docs.oasis-open.org/ws-sx/ws-trust/200512'><Body><Fault>"
+                                "<faultcode>FailedAuthentication</faultcode></Fault></Body></Envelope>"),
+                        SsoException, "Unexpected SOAP fault: FailedAuthentication; request failed.");
+}
+
 TEST(CheckSoapFault, AddsNothingForAFaultStringThatIsEmptyMissingOrNoText) {
   const std::string code = "<faultcode>wst:FailedAuthentication</faultcode>";
   for (const char *text : {"", "<faultstring/>", "<faultstring></faultstring>", "<faultstring><b>x</b></faultstring>",
@@ -238,6 +244,7 @@ TEST(HandleValidateSubjectResponse, ReadsBothVerdicts) {
 
 TEST(HandleValidateSubjectResponse, ReadsTextThatStandsInCdataOrBeforeAComment) {
   EXPECT_EQ(Validate(Testing::ValidateResponse("<![CDATA[" + std::string(VALID) + "]]>")), "valid");
+  EXPECT_EQ(Validate(Testing::ValidateResponse(std::string(VALID) + "<!-- x -->")), "valid");
 }
 
 TEST(HandleValidateSubjectResponse, RefusesAnyOtherText) {
@@ -325,6 +332,15 @@ TEST(HandleSPNegoResponse, RefusesAFinalLegWithoutToken) {
     EXPECT_THROWS_MESSAGE(ReadLeg(Envelope(Collection(ResponseElement(content, " Context='c'")))), SsoException,
                           UNEXPECTED);
   }
+}
+
+TEST(HandleSPNegoResponse, ReportsOfAFinalLegTheFirstOfSeveralMistakes) {
+  const auto final = [](const char *context, const std::string &content) {
+    return Envelope(Collection(ResponseElement("<BinaryExchange>AQI</BinaryExchange>" + content, context)));
+  };
+  EXPECT_THROWS_MESSAGE(ReadLeg(final("", Requested(ASSERTION))), SsoException, UNEXPECTED);
+  EXPECT_THROWS_MESSAGE(ReadLeg(final(" Context='c'", "")), SsoException, "Base64 format exception");
+  EXPECT_THROWS_MESSAGE(ReadLeg(Envelope(Collection(ResponseElement("", " Context='c'")))), SsoException, UNEXPECTED);
 }
 
 TEST(HandleSPNegoResponse, RefusesAFinalLegOfAnotherTokenTypeWithAMessageWhoseParenthesisStaysOpen) {

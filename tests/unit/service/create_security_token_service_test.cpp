@@ -70,6 +70,13 @@ TEST(CreateSecurityTokenService, GivesTheHolderOfKeyIdentityToTheRequests) {
   EXPECT_NE(server.GetRequests().at(0).find("ds:SignatureValue"), std::string::npos);
 }
 
+TEST(CreateSecurityTokenService, RefusesAnIdentityWithoutKeyAndCertificate) {
+  SecurityTokenServiceConfig config = ConfigFor("http://localhost/");
+  config.holderOfKeyConfig = HolderOfKeyConfig();
+  EXPECT_THROWS_MESSAGE(CreateSecurityTokenService(config), Tarvel::InvalidArgumentException,
+                        "Invalid argument : HolderOfKeyConfig lacks its private key or its certificate");
+}
+
 TEST(CreateSecurityTokenService, RefusesHttpsWithoutAContextAndAnAddressThatIsNone) {
   EXPECT_THROWS_MESSAGE(CreateSecurityTokenService(ConfigFor("https://localhost/")), Tarvel::InvalidArgumentException,
                         "Invalid argument : HTTPS connection requested but no SSLContext provided.");
