@@ -16,6 +16,8 @@ if(NOT CMAKE_BUILD_TYPE STREQUAL "Debug" AND NOT SSOCLIENT_SANITIZERS)
   target_compile_definitions(ssoclient_options INTERFACE _FORTIFY_SOURCE=2)
 endif()
 target_compile_options(ssoclient_options INTERFACE -fstack-protector-strong)
+# Asio gives its symbols default visibility otherwise, and a host's Asio, of another version, would take their place.
+target_compile_definitions(ssoclient_options INTERFACE BOOST_ASIO_DISABLE_VISIBILITY)
 
 if(SSOCLIENT_SANITIZERS)
   list(JOIN SSOCLIENT_SANITIZERS "," sanitizers)
@@ -34,3 +36,11 @@ if(SSOCLIENT_FUZZ_ENGINE)
   endif()
   add_compile_options(-fsanitize=fuzzer-no-link)
 endif()
+
+# Threads of the library outlive each use of it: a program that closes a plug-in which uses it must not pull the code away
+# from under them.
+function(ssoclient_keep_loaded target)
+  if(BUILD_SHARED_LIBS)
+    target_link_options(${target} PRIVATE LINKER:-z,nodelete)
+  endif()
+endfunction()

@@ -1,0 +1,30 @@
+// SPDX-License-Identifier: Apache-2.0
+// Loads a plug-in, has it work, and lets go of it. Threads of the library live on: it must stay where it is.
+#include <dlfcn.h>
+
+#include <chrono>
+#include <cstdio>
+#include <initializer_list>
+#include <thread>
+
+int main(int argc, char **argv) {
+  void *const plugin = argc == 2 ? dlopen(argv[1], RTLD_NOW | RTLD_LOCAL) : nullptr;
+  if (!plugin) {
+    std::fprintf(stderr, "%s\n", argc == 2 ? dlerror() : "usage: host PLUGIN");
+    return 2;
+  }
+  const auto run = reinterpret_cast<int (*)()>(dlsym(plugin, "Run"));
+  if (!run || run() != 0) {
+    std::fputs("the plug-in did not work\n", stderr);
+    return 1;
+  }
+  dlclose(plugin);
+  for (const char *library : {"libtarvel.so.0", "libssoclient.so.0"}) {
+    if (!dlopen(library, RTLD_NOW | RTLD_NOLOAD)) {
+      std::fprintf(stderr, "%s went with the plug-in\n", library);
+      return 1;
+    }
+  }
+  std::this_thread::sleep_for(std::chrono::milliseconds(100)); // in which a thread without its code would fall
+  return 0;
+}
