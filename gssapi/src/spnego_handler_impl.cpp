@@ -8,12 +8,16 @@
 
 #include <gssapi/gssapi_ext.h>
 
+#include <algorithm>
+#include <cstdint>
 #include <string>
 #include <utility>
 
 namespace SsoClient::Gssapi {
 
 namespace {
+
+constexpr std::int64_t MAX_TIME_LIMIT_SEC = std::int64_t{365} * 24 * 3600; // so that no conversion overflows
 
 void RequireText(const std::string &text) {
   if (text.find('\0') != std::string::npos) {
@@ -147,7 +151,7 @@ void SpnegoHandlerImpl::CountLeg() {
 }
 
 void SpnegoHandlerImpl::CheckTime() const {
-  if (m_clock() - m_start > std::chrono::seconds(m_settings.timeLimitSec)) {
+  if (m_clock() - m_start > std::chrono::seconds(std::min(m_settings.timeLimitSec, MAX_TIME_LIMIT_SEC))) {
     throw GssLimitException("The negotiation with " + m_settings.service +
                             " reached its time limit: " + std::to_string(m_settings.timeLimitSec) + " s");
   }

@@ -9,9 +9,10 @@ namespace SsoClient::SchemaNames {
 
 using Tarvel::Xml::QName;
 
-const QName XSI_TYPE(std::string(Namespaces::XSI), "type");
-const QName KEY_INFO_CONFIRMATION_DATA_TYPE(std::string(Namespaces::SAML), "KeyInfoConfirmationDataType");
-const QName DELEGATION_RESTRICTION_TYPE(std::string(Namespaces::DELEGATION), "DelegationRestrictionType");
-const QName RENEW_RESTRICTION_TYPE(std::string(Namespaces::RSA_SAML2), "RenewRestrictionType");
+// Never destroyed: a token may be read on a thread of the pool while the process ends.
+const QName &XSI_TYPE = *new QName(std::string(Namespaces::XSI), "type");
+const QName &KEY_INFO_CONFIRMATION_DATA_TYPE = *new QName(std::string(Namespaces::SAML), "KeyInfoConfirmationDataType");
+const QName &DELEGATION_RESTRICTION_TYPE = *new QName(std::string(Namespaces::DELEGATION), "DelegationRestrictionType");
+const QName &RENEW_RESTRICTION_TYPE = *new QName(std::string(Namespaces::RSA_SAML2), "RenewRestrictionType");
 
 } // namespace SsoClient::SchemaNames

@@ -8,9 +8,9 @@
 
 namespace SsoClient::SchemaNames {
 
-extern const Tarvel::Xml::QName XSI_TYPE;
-extern const Tarvel::Xml::QName KEY_INFO_CONFIRMATION_DATA_TYPE;
-extern const Tarvel::Xml::QName DELEGATION_RESTRICTION_TYPE;
-extern const Tarvel::Xml::QName RENEW_RESTRICTION_TYPE;
+extern const Tarvel::Xml::QName &XSI_TYPE;
+extern const Tarvel::Xml::QName &KEY_INFO_CONFIRMATION_DATA_TYPE;
+extern const Tarvel::Xml::QName &DELEGATION_RESTRICTION_TYPE;
+extern const Tarvel::Xml::QName &RENEW_RESTRICTION_TYPE;
 
 } // namespace SsoClient::SchemaNames

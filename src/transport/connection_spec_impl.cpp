@@ -51,6 +51,9 @@ void OnSocketConnected(const TlsLayer &layer, const Ref<Stream> &socket, const E
     StartHandshake(layer, socket, completion);
   } catch (const Exception &exception) {
     completion(socket, &exception);
+  } catch (const std::exception &exception) {
+    const Tarvel::System::NetworkException failureOfOurs(exception.what());
+    completion(socket, &failureOfOurs);
   }
 }
 

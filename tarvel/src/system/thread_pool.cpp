@@ -24,6 +24,7 @@ namespace System {
 namespace {
 
 constexpr std::chrono::seconds DEFAULT_IDLE_TIME{10};
+constexpr std::chrono::milliseconds MAX_IDLE_TIME = std::chrono::hours(24 * 365); // so that no addition overflows
 
 class WorkItem;
 using WorkQueue = std::list<Ref<WorkItem>>;
@@ -31,7 +32,7 @@ using WorkQueue = std::list<Ref<WorkItem>>;
 /// What the pool object, its threads and its items share; it lives as long as the last of them.
 struct PoolState {
   PoolState(std::size_t threadCeiling, std::chrono::milliseconds threadIdleTime, bool isEndlessPool)
-      : ceiling(threadCeiling), idleTime(threadIdleTime), isEndless(isEndlessPool) {}
+      : ceiling(threadCeiling), idleTime(std::min(threadIdleTime, MAX_IDLE_TIME)), isEndless(isEndlessPool) {}
 
   const std::size_t ceiling;
   const std::chrono::milliseconds idleTime;

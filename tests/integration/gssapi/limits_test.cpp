@@ -8,6 +8,8 @@
 #include <gtest/gtest.h>
 
 #include <chrono>
+#include <cstdint>
+#include <limits>
 #include <memory>
 
 namespace SsoClient::Gssapi {
@@ -104,6 +106,15 @@ TEST(HandlerLimits, LetANegotiationTakeAllItsTime) {
   timed.now += seconds(5);
   EXPECT_NO_THROW(timed.handler->NegotiateLeg(finalLeg));
   EXPECT_TRUE(timed.handler->IsMutuallyAuthenticated());
+}
+
+TEST(HandlerLimits, MayBeSoLongAsToBeNone) {
+  const RealmWithAlice world;
+  world.LogIn();
+  GssAcceptor service = world.MakeAcceptor();
+  SpnegoSettings settings = SettingsFor();
+  settings.timeLimitSec = std::numeric_limits<std::int64_t>::max();
+  EXPECT_EQ(Testing::Negotiate(*CreateSpnegoHandler(settings), service), 2);
 }
 
 TEST(HandlerLimits, CountTheTimeThatTheRealmTakes) {

@@ -87,6 +87,21 @@ TEST(ThreadPool, AnIdleThreadTakesTheNextItem) {
   EXPECT_LE(pool->GetThreadCount(), 3u);
 }
 
+TEST(ThreadPool, AnIdleThreadNeverRetiresWhenTheIdleTimeIsEndless) {
+  const Ref<ThreadPool> pool = CreateThreadPool(1, std::chrono::milliseconds::max());
+  const auto countOnItsThread = [&pool] {
+    std::promise<int> counted;
+    pool->QueueWorkItem([&counted] {
+      thread_local int count = 0;
+      counted.set_value(++count);
+    });
+    return counted.get_future().get();
+  };
+  for (int item = 1; item <= 20; ++item) {
+    EXPECT_EQ(countOnItsThread(), item);
+  }
+}
+
 TEST(ThreadPool, IdleThreadsRetire) {
   const std::size_t before = Testing::CountThreads();
   const Ref<ThreadPool> pool = CreateThreadPool(8, std::chrono::milliseconds(1));

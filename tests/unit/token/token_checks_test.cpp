@@ -224,4 +224,29 @@ TEST_F(CheckTokenPropertiesTest, NamesTheFirstRuleThatFails) {
                         "Token start date is in the future: 2026-01-02T05:34:05.006Z");
 }
 
+TEST_F(CheckTokenPropertiesTest, NamesOfABearerTokenTheFirstRuleThatFails) {
+  SamlAssertionType assertion = WithDelegation(Good(), BACKUP, {});
+  DateTime &subjectEnd = assertion.Subject.SubjectConfirmation.SubjectConfirmationData.NotOnOrAfter;
+  assertion.Conditions.NotOnOrAfter = AtSecond(-600);
+  subjectEnd = AtSecond(-601);
+  EXPECT_THROWS_MESSAGE(Check(assertion), ParseException, "The token has expired at: 2026-01-02T02:54:05.006Z");
+  assertion.Conditions.NotOnOrAfter = AtSecond(3600);
+  EXPECT_THROWS_MESSAGE(Check(assertion), ParseException, "Invalid token subject validity");
+  subjectEnd = AtSecond(3600);
+  EXPECT_THROWS_MESSAGE(Check(assertion), ParseException,
+                        "Token SubjectConfirmation contains delegate id, but no delegation restriction is present");
+}
+
+TEST_F(CheckTokenPropertiesTest, ReadsTheClockOnce) {
+  int looks = 0;
+  const std::int64_t now = AtSecond(0).GetUtcTime();
+  const auto look = [&looks, now] {
+    ++looks;
+    return now;
+  };
+  const Tarvel::System::ScopedEnvironment clock({look, {}});
+  Check(Good());
+  EXPECT_EQ(looks, 1);
+}
+
 } // namespace
