@@ -411,20 +411,24 @@ void FullPort::Empty() {
   }
   m_fillers.clear();
   pollfd listener{m_listener, POLLIN, 0};
-  while (::poll(&listener, 1, 0) > 0) {
-    ::close(::accept4(m_listener, nullptr, nullptr, SOCK_CLOEXEC));
+  int waiting = 0;
+  while (::poll(&listener, 1, 0) > 0 && (waiting = ::accept4(m_listener, nullptr, nullptr, SOCK_CLOEXEC)) >= 0) {
+    ::close(waiting);
   }
 }
 
-void FullPort::AnswerOne(std::string_view bytes) {
-  std::string request;
-  while (request.empty()) {
-    ServerConnection connection(::accept4(m_listener, nullptr, nullptr, SOCK_CLOEXEC), nullptr);
-    request = connection.ReadRequest();
-    if (!request.empty()) {
+void FullPort::AnswerAll(std::string_view bytes) {
+  int descriptor = -1;
+  while ((descriptor = ::accept4(m_listener, nullptr, nullptr, SOCK_CLOEXEC)) >= 0) {
+    ServerConnection connection(descriptor, nullptr);
+    if (!connection.ReadRequest().empty()) {
       connection.Write(bytes);
     }
   }
+}
+
+void FullPort::StopAnswering() {
+  ::shutdown(m_listener, SHUT_RDWR);
 }
 
 } // namespace Testing

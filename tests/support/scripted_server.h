@@ -165,10 +165,11 @@ public:
   ~FullPort();
   int GetPort() const noexcept { return m_port; }
 
-  /// Makes room in the queue. Whoever asks from now on gets an answer from `AnswerOne`.
+  /// Makes room in the queue. Whoever asks from now on gets an answer from `AnswerAll`.
   void Empty();
-  /// Waits for a connection that sends a request, and answers it.
-  void AnswerOne(std::string_view bytes);
+  /// Answers each connection that sends a request, until `StopAnswering` is called on another thread.
+  void AnswerAll(std::string_view bytes);
+  void StopAnswering();
 
 private:
   int m_port = 0; // before the listener, which sets it

@@ -45,6 +45,7 @@ RealmFacts EndProcessWithRealm(int signal) {
   EXPECT_EQ(::pipe(pipe.data()), 0);
   const pid_t child = fork();
   if (child == 0) {
+    alarm(60); // threads of other tests may have held locks when the process was forked
     const KerberosRealm realm;
     RealmFacts facts;
     facts.centre = realm.GetCentre();

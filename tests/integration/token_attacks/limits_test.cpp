@@ -3,6 +3,7 @@
 // and no faster. Cost is counted in octets allocated, which no load on the machine can change.
 
 #include "outcome.h"
+#include "support/work_folder.h"
 
 #include <tarvel/xml/parser.h>
 
@@ -10,9 +11,6 @@
 
 #include <cstddef>
 #include <cstdlib>
-#include <filesystem>
-#include <fstream>
-#include <iterator>
 #include <new>
 #include <string>
 
@@ -178,21 +176,14 @@ protected:
     Empty(xml, "ds:DigestValue");
     Empty(xml, "ds:SignatureValue");
 
-    const std::filesystem::path folder =
-        std::filesystem::temp_directory_path() /
-        ("token_attacks." + std::to_string(::testing::UnitTest::GetInstance()->random_seed()) + "." +
-         std::to_string(std::hash<std::string>()(testing::TempDir() + __FILE__)));
-    std::filesystem::create_directories(folder);
-    const std::string in = (folder / "in.xml").string();
-    const std::string out = (folder / "out.xml").string();
-    std::ofstream(in, std::ios::binary) << xml;
+    const Testing::WorkFolder folder;
+    const std::string in = folder.Write("in.xml", xml);
+    const std::string out = folder / "out.xml";
     const std::string command = "xmlsec1 --sign --privkey-pem " TEST_DATA_DIR "/tokens/sts-rsa.key --id-attr:ID "
                                 "urn:oasis:names:tc:SAML:2.0:assertion:Assertion --output " +
-                                out + " " + in + " 2>" + (folder / "log").string();
+                                out + " " + in + " 2>" + folder / "log";
     ASSERT_EQ(0, std::system(command.c_str()));
-    std::ifstream file(out, std::ios::binary);
-    m_xml.assign(std::istreambuf_iterator<char>(file), {});
-    std::filesystem::remove_all(folder);
+    m_xml = folder.Read("out.xml");
   }
 
   static void Empty(std::string &xml, const std::string &element) {

@@ -95,7 +95,7 @@ void AllowDescriptors(rlim_t count) {
 }
 
 TEST(TransportAsync, HasFiveHundredRequestsInFlightWithoutAThreadForEach) {
-  ASSERT_NO_FATAL_FAILURE(AllowDescriptors(2 * REQUESTS + 200));
+  ASSERT_NO_FATAL_FAILURE(AllowDescriptors(2 * REQUESTS + 1000));
   std::atomic<int> received{0};
   ServiceStandIn service([&](ServerConnection &connection) {
     connection.ReadRequest();

@@ -129,8 +129,9 @@ TEST(TransportTimeoutOfTheConnect, EndsTheRequestInTimeAndLeavesNothingBehind) {
   EXPECT_EQ(CountDescriptors(), descriptors);
 
   full.Empty();
-  std::thread server([&full] { full.AnswerOne(Testing::Response("200 OK", "<after/>")); });
+  std::thread server([&full] { full.AnswerAll(Testing::Response("200 OK", "<after/>")); });
   EXPECT_TRUE(WorksAgain(*session));
+  full.StopAnswering();
   server.join();
 }
 
