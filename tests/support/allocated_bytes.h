@@ -5,7 +5,7 @@
 
 #pragma once
 
-#include "support/process_resources.h"
+#include "support/sanitized.h"
 
 #include <malloc.h>
 

@@ -5,6 +5,7 @@
 #pragma once
 
 #include "support/completion.h"
+#include "support/sanitized.h"
 
 #include <chrono>
 #include <cstddef>
@@ -29,22 +30,6 @@ inline std::size_t CountThreads() {
   static_cast<void>(started);
   return CountEntries("/proc/self/task");
 }
-
-// Whether this is a build under AddressSanitizer or ThreadSanitizer; g++ and clang say so in different words.
-#if defined(__SANITIZE_ADDRESS__) || defined(__SANITIZE_THREAD__)
-#define TESTING_IS_SANITIZED 1
-#elif defined(__has_feature)
-#if __has_feature(address_sanitizer) || __has_feature(thread_sanitizer)
-#define TESTING_IS_SANITIZED 1
-#endif
-#endif
-
-/// Under a sanitizer everything takes many times as long.
-#ifdef TESTING_IS_SANITIZED
-constexpr bool IS_SANITIZED = true;
-#else
-constexpr bool IS_SANITIZED = false;
-#endif
 
 /// Whether `condition` comes true in bounded time. For what ends in the kernel, which notifies nobody.
 template <typename Condition>

@@ -155,6 +155,7 @@ TEST(RequireTextualContent, TakesTheOneText) {
   EXPECT_EQ(" a&b ", textOf("<r> a&amp;b </r>"));
   EXPECT_EQ("text", textOf("<r>text<!-- note --></r>"));
   EXPECT_EQ("text", textOf("<r><!-- note -->text</r>"));
+  EXPECT_EQ("text", textOf("<r> <!-- note -->text<!-- note -->\n</r>"));
   EXPECT_EQ("text<b>", textOf("<r>text<![CDATA[<b>]]></r>"));
 }
 
