@@ -212,6 +212,11 @@ void CheckSource(std::string_view source) {
   if (source.size() > MAX_DOCUMENT_BYTES) {
     Refuse("the document is longer than " + std::to_string(MAX_DOCUMENT_BYTES) + " bytes", source, MAX_DOCUMENT_BYTES);
   }
+  // libxml2 would pass over a second mark, though XML has no place for one.
+  const std::size_t markLength = GetByteOrderMarkLength(source);
+  if (markLength > 0 && GetByteOrderMarkLength(source.substr(markLength)) > 0) {
+    Refuse("the document begins with two byte order marks", source, markLength);
+  }
   CheckEncoding(source);
   CheckDeclaration(source);
   CheckAttributeCounts(source);

@@ -156,6 +156,12 @@ TEST(ParserLimits, AcceptsUnboundPrefixesInNumberWhenNamesAreShort) {
   EXPECT_NO_THROW(ParseDocument("<r>" + Repeat("<p:a q:x='1'/>", 1'000'000) + "</r>"));
 }
 
+TEST(ParserLimits, RefusesASecondByteOrderMark) {
+  const std::string mark = "\xEF\xBB\xBF";
+  EXPECT_NO_THROW(::Testing::ParseDocument(mark + "<a/>"));
+  EXPECT_THROW(::Testing::ParseDocument(mark + mark + "<a/>"), XMLParseException);
+}
+
 TEST(ParserLimits, ReadsLargeDocumentsOfSmallPartsInLinearTime) {
   // Each of these takes well under a second when time is linear, and minutes when it is quadratic.
   EXPECT_NO_THROW(ParseDocument("<r>" + Repeat("<a/>", 2'000'000) + "</r>"));
