@@ -52,6 +52,7 @@ SSL_CTX *CreateTls(const TlsSettings &settings) {
           "no key");
   static constexpr unsigned char SESSION_CONTEXT[] = "tests";
   SSL_CTX_set_session_id_context(tls, SESSION_CONTEXT, sizeof SESSION_CONTEXT - 1);
+  Require(SSL_CTX_set_num_tickets(tls, settings.tickets) == 1, "bad number of tickets");
   if (!settings.resumesSessions) {
     SSL_CTX_set_session_cache_mode(tls, SSL_SESS_CACHE_OFF);
     SSL_CTX_set_options(tls, SSL_OP_NO_TICKET);

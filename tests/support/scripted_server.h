@@ -31,6 +31,7 @@ struct TlsSettings {
   bool demandsClient = false;  ///< a certificate that chains to "authority" through "intermediate"
   bool allowsWeakness = false; ///< security level 0, without which OpenSSL offers no TLS 1.1
   bool resumesSessions = true;
+  std::size_t tickets = 2; ///< of TLS 1.3, for each full handshake
 };
 
 /// One accepted connection, in the hands of the script, on a thread of its own. Every wait is bounded: a call that gets no

@@ -29,6 +29,8 @@ constexpr std::size_t INPUT_BYTES = 5 + 16384 + 256;
 /// not held a second time.
 constexpr std::size_t RECORD_BYTES = 16384;
 constexpr std::size_t MAX_OUTPUT_BYTES = 4 * RECORD_BYTES;
+/// Of one connection. A server that hands out more wants them used by as many connections at once.
+constexpr std::size_t MAX_NEW_SESSIONS = 8;
 
 std::string DescribeSubject(X509 *certificate) {
   const Crypto::BioHandle text(BIO_new(BIO_s_mem()));
@@ -105,14 +107,17 @@ SSLStreamImpl::~SSLStreamImpl() {
   const Crypto::OpenSslUse use;
   if (!use) {
     Crypto::OpenSslUse::Abandon(m_connection.release());
+    for (SessionHandle &session : m_newSessions) {
+      Crypto::OpenSslUse::Abandon(session.release());
+    }
     return;
   }
   const Crypto::OpenSslErrorScope errors;
-  if (m_connection && m_stage == Stage::ESTABLISHED) {
+  if (m_stage == Stage::ESTABLISHED) {
     // Else OpenSSL takes the connection for a broken one and its session for no longer resumable.
     SSL_set_shutdown(m_connection.get(), SSL_SENT_SHUTDOWN | SSL_RECEIVED_SHUTDOWN);
   }
-  m_connection.reset();
+  EndConnection();
 }
 
 void SSLStreamImpl::AsyncHandshake(const std::string &host, const std::string &parameter, HandshakeHandler handler) {
@@ -156,14 +161,15 @@ void SSLStreamImpl::Close() noexcept {
     auto done = std::make_shared<Completions>();
     if (const Crypto::OpenSslUse use; use) {
       const std::lock_guard<std::mutex> lock(m_mutex);
+      const Crypto::OpenSslErrorScope errors;
       if (m_stage == Stage::ESTABLISHED && !m_lowerWrites) {
-        const Crypto::OpenSslErrorScope errors;
         SSL_shutdown(m_connection.get()); // the notice leaves only if the stream below takes it at once
         StartLowerWrite();
       }
       if (m_stage != Stage::FAILED) {
         Fail("closed by this side", *done);
       }
+      EndConnection();
     }
     if (!done->IsEmpty()) {
       boost::asio::post(System::GetIoContext(), [done] { done->Run(); });
@@ -264,7 +270,7 @@ void SSLStreamImpl::FinishHandshake(Completions &done) {
   }
   m_stage = Stage::ESTABLISHED;
   // Up to TLS 1.2 a session can be resumed again and again, and the server need not give a new one.
-  if (m_wasResumed && !m_hasNewSession && SSL_version(m_connection.get()) == TLS1_2_VERSION) {
+  if (m_wasResumed && m_newSessions.empty() && SSL_version(m_connection.get()) == TLS1_2_VERSION) {
     KeepSession(SessionHandle(SSL_get1_session(m_connection.get())));
   }
   done.AddHandshake(std::exchange(m_handshake, nullptr), nullptr);
@@ -322,8 +328,21 @@ int SSLStreamImpl::OnNewSession(SSL *connection, SSL_SESSION *session) noexcept 
 }
 
 void SSLStreamImpl::KeepSession(SessionHandle session) {
-  m_hasNewSession = true;
-  m_context->GetSessions().Put(m_sessionKey, std::move(session));
+  if (m_newSessions.size() == MAX_NEW_SESSIONS) {
+    m_newSessions.erase(m_newSessions.begin());
+  }
+  m_newSessions.push_back(std::move(session));
+}
+
+void SSLStreamImpl::EndConnection() noexcept {
+  m_connection.reset();
+  try {
+    for (SessionHandle &session : std::exchange(m_newSessions, {})) {
+      m_context->GetSessions().Put(m_sessionKey, std::move(session));
+    }
+  } catch (...) {
+    LogUncaughtException("the keeping of a TLS session"); // freed by its handle
+  }
 }
 
 void SSLStreamImpl::StepWrite(Completions &done) {

@@ -84,6 +84,8 @@ private:
   std::string RefuseServer() const;
   std::string VerifyServer(X509_STORE_CTX *verification) const;
   void KeepSession(SessionHandle session);
+  /// Frees the connection and has its sessions remembered. The stream has failed, or nobody holds it any more.
+  void EndConnection() noexcept;
 
   /// Whether OpenSSL, whose call gave `result`, waits for bytes. If not, the stream has failed.
   bool WaitsForBytes(int result, const Crypto::OpenSslErrorScope &errors, Completions &done);
@@ -103,12 +105,13 @@ private:
   std::string m_parameter;
   std::optional<ServerIdentity> m_identity;
   std::string m_sessionKey;
-  bool m_hasNewSession = false;
   std::string m_verifyFailure;
 
   ConnectionHandle m_connection; // used on the I/O threads alone, but for its end
-  BIO *m_received = nullptr;     // owned by m_connection: from below, still encrypted
-  BIO *m_toSend = nullptr;       // owned by m_connection: for below, encrypted
+  // The oldest first. Not to be seen by others yet: the connection copies and changes its sessions, and takes no lock.
+  std::vector<SessionHandle> m_newSessions;
+  BIO *m_received = nullptr; // owned by m_connection: from below, still encrypted
+  BIO *m_toSend = nullptr;   // owned by m_connection: for below, encrypted
 
   HandshakeHandler m_handshake;
   std::optional<PendingRead> m_read;

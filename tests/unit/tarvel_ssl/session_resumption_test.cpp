@@ -1,12 +1,15 @@
 // SPDX-License-Identifier: Apache-2.0
 
 #include "ssl/session_cache.h"
+#include "ssl/ssl_context_impl.h"
+#include "support/process_resources.h"
 #include "unit/tarvel_ssl/tls_client.h"
 
 #include <gtest/gtest.h>
 
 #include <openssl/ssl.h>
 
+#include <cstddef>
 #include <string>
 
 namespace Tarvel {
@@ -48,6 +51,8 @@ protected:
     return told;
   }
 
+  std::size_t CountSessions() const { return dynamic_cast<SSLContextImpl &>(*m_context).GetSessions().GetSize(); }
+
   const Ref<SSLContext> m_context = CreateTrustingContext();
   ScriptedServer m_server{TellWhetherResumed, Settings()};
 };
@@ -65,7 +70,24 @@ TEST_P(SessionResumption, ASessionIsResumedThoughItsConnectionWasOnlyDropped) {
     ASSERT_EQ(client.ShakeHands(), "");
     ASSERT_EQ(client.Read(), "full");
   }
+  EXPECT_TRUE(Testing::Eventually([this] { return CountSessions() > 0; })); // an I/O thread may hold the stream a bit
   EXPECT_EQ(Connect(), "resumed");
+}
+
+// OpenSSL changes and copies the session of a living connection without a lock.
+TEST_P(SessionResumption, ASessionIsResumedOnlyOnceItsConnectionHasEnded) {
+  TlsClient first(m_context, m_server.GetPort());
+  ASSERT_EQ(first.ShakeHands(), "");
+  ASSERT_EQ(first.Read(), "full");
+  TlsClient second(m_context, m_server.GetPort());
+  ASSERT_EQ(second.ShakeHands(), "");
+  EXPECT_EQ(second.Read(), "full");
+  EXPECT_EQ(CountSessions(), 0u);
+  first.GetStream()->Close();
+  EXPECT_GT(CountSessions(), 0u);
+  TlsClient third(m_context, m_server.GetPort());
+  ASSERT_EQ(third.ShakeHands(), "");
+  EXPECT_EQ(third.Read(), "resumed");
 }
 
 TEST_P(SessionResumption, EveryHostNameHasSessionsOfItsOwn) {
@@ -121,6 +143,18 @@ TEST_P(SessionResumption, AServerThatForgotGetsAFullHandshake) {
 
 INSTANTIATE_TEST_SUITE_P(Versions, SessionResumption, testing::Values(TLS1_2_VERSION, TLS1_3_VERSION),
                          [](const auto &version) { return version.param == TLS1_2_VERSION ? "TLS12" : "TLS13"; });
+
+TEST(SessionsOfOneConnection, AreBounded) {
+  TlsSettings settings;
+  settings.tickets = 100;
+  ScriptedServer server(TellWhetherResumed, settings);
+  const Ref<SSLContext> context = CreateTrustingContext();
+  TlsClient client(context, server.GetPort());
+  ASSERT_EQ(client.ShakeHands(), "");
+  EXPECT_EQ(client.Read(), "full");
+  client.GetStream()->Close();
+  EXPECT_EQ(dynamic_cast<SSLContextImpl &>(*context).GetSessions().GetSize(), 8u);
+}
 
 TEST(SessionCache, ForgetsWhatCannotBeResumed) {
   SessionCache cache;
