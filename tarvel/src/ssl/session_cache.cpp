@@ -34,8 +34,10 @@ bool IsUsable(const SSL_SESSION *session) {
 
 void SessionCache::Put(const std::string &key, SessionHandle session) {
   const std::lock_guard<std::mutex> lock(m_mutex);
-  const auto entry = m_entries.insert(m_entries.end(), Entry{key, std::move(session)});
-  m_byKey.emplace(key, entry);
+  Entries entry;
+  entry.push_back(Entry{key, std::move(session)});
+  m_byKey.emplace(key, entry.begin());
+  m_entries.splice(m_entries.end(), entry); // in both places or, without memory, in none
   if (m_byKey.count(key) > MAX_SESSIONS_PER_KEY) {
     const auto oldest = m_byKey.lower_bound(key);
     m_entries.erase(oldest->second);
