@@ -216,6 +216,8 @@ Identity OpenIdentity(const fs::path &folder, const Purpose &purpose, const Iden
     MakeIdentity(purpose, identity, authority);
   }
   identity.certificate = ReadCertificate(identity.certificateFile);
+  // OpenSSL decodes the extensions when they are first asked for: better now than by several connections at once.
+  X509_check_purpose(identity.certificate.get(), -1, 0);
   const PrivateKey key = ReadKey(identity.keyFile);
   if (X509_check_private_key(identity.certificate.get(), key.get()) != 1) {
     FailAt(identity.certificateFile, "does not belong to the key beside it");
