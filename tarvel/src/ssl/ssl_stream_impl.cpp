@@ -385,6 +385,7 @@ bool SSLStreamImpl::WaitsForBytes(int result, const Crypto::OpenSslErrorScope &e
     Fail("the server ended the connection without TLS's closing notice", done);
     return false;
   }
+  m_newSessions.clear(); // not to be resumed after a fatal alert (RFC 8446, section 6.2)
   Fail(m_verifyFailure.empty() ? errors.TakeText() : m_verifyFailure, done);
   return false;
 }

@@ -90,6 +90,24 @@ TEST_P(SessionResumption, ASessionIsResumedOnlyOnceItsConnectionHasEnded) {
   EXPECT_EQ(third.Read(), "resumed");
 }
 
+TEST_P(SessionResumption, NoSessionIsResumedAfterAFatalAlert) {
+  ScriptedServer garbling(
+      [](ServerConnection &connection) {
+        if (connection.ShakeHands() && connection.Write("full")) {
+          connection.WriteRaw(std::string("\x17\x03\x03\x00\x20", 5) + std::string(32, 'x'));
+          connection.ReadSome();
+        }
+      },
+      Settings());
+  TlsClient client(m_context, garbling.GetPort());
+  ASSERT_EQ(client.ShakeHands(), "");
+  ASSERT_EQ(client.Read(), "full");
+  client.Read();
+  EXPECT_TRUE(client.HasFailed());
+  client.GetStream()->Close();
+  EXPECT_EQ(CountSessions(), 0u);
+}
+
 TEST_P(SessionResumption, EveryHostNameHasSessionsOfItsOwn) {
   EXPECT_EQ(Connect("localhost"), "full");
   EXPECT_EQ(Connect("127.0.0.1"), "full");
