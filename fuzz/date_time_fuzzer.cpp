@@ -62,7 +62,8 @@ bool ReadByCLibrary(std::string_view text, std::int64_t &utc) {
                     fields.tm_mday == written.tm_mday && fields.tm_hour == written.tm_hour &&
                     fields.tm_min == written.tm_min && fields.tm_sec == written.tm_sec;
   const int zoneMinutes = Field(match, 11) * 60 + Field(match, 12);
-  if (!kept || Field(match, 12) > 59 || zoneMinutes > 14 * 60) {
+  const bool isYearZero = fields.tm_year == -1900; // XML Schema 1.0 has none, though its last day would end in year 1
+  if (!kept || isYearZero || Field(match, 12) > 59 || zoneMinutes > 14 * 60) {
     return false;
   }
   const std::int64_t shown = seconds + (isDaysEnd ? 86'400 : 0);

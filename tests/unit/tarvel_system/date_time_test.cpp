@@ -141,6 +141,7 @@ TEST(DateTime, RefusesFieldsOutOfRange) {
   };
   const Row table[] = {
       {"0000-01-01T00:00:00Z", "year out of range"},
+      {"0000-12-31T24:00:00Z", "year out of range"},
       {"2024-00-01T00:00:00Z", "month out of range"},
       {"2024-13-01T00:00:00Z", "month out of range"},
       {"2024-01-00T00:00:00Z", "day out of range"},
