@@ -70,6 +70,7 @@ TEST(Process, EndsAtOnceThoughConnectionsAreOpen) {
 }
 
 TEST(Process, ThatEndsBadlyFailsTheTestsThatUseIt) {
+  testing::FLAGS_gtest_death_test_style = "threadsafe";
   const auto abortService = [] {
     const DevSts service;
     ::kill(service.GetProcess(), SIGABRT);

@@ -3,6 +3,7 @@
 // handler, and leg by leg.
 
 #include "integration/gssapi/service_world.h"
+#include "support/process_resources.h"
 #include "support/throws_message.h"
 
 #include <ssoclient/saml_token.h>
@@ -10,6 +11,7 @@
 #include <gtest/gtest.h>
 
 #include <future>
+#include <memory>
 #include <set>
 #include <string>
 #include <vector>
@@ -28,6 +30,11 @@ SpnegoSettings DceStyle() {
   SpnegoSettings settings = SettingsFor();
   settings.dceStyle = true;
   return settings;
+}
+
+/// Whether the pool has let go of it: the GSSAPI must not be in use when the process ends.
+bool IsReleased(const std::shared_ptr<SpnegoHandler> &handler) {
+  return Testing::Eventually([&handler] { return handler.use_count() == 1; });
 }
 
 std::size_t CountIn(const std::string &text, const std::string &word) {
@@ -92,6 +99,7 @@ TEST(GssAcquisition, RunsOnThePoolAsWell) {
                                     outcome.set_value(failure ? failure->what() : SubjectOf(*token));
                                   });
   EXPECT_EQ(outcome.get_future().get(), "alice@corp.example");
+  ASSERT_TRUE(IsReleased(handler));
 }
 
 TEST(GssAcquisition, RunsOnSeveralThreadsAtOnce) {
@@ -135,6 +143,7 @@ TEST(GssAcquisition, TellsOfMissingCredentialsOnThePoolAsItsOwnClass) {
                                     outcome.set_value(dynamic_cast<const GssCredentialException *>(failure) != nullptr);
                                   });
   EXPECT_TRUE(outcome.get_future().get());
+  ASSERT_TRUE(IsReleased(handler));
 }
 
 TEST(GssNegotiationByHand, TakesOneMessage) {

@@ -65,8 +65,8 @@ TEST_F(TokenFile, IsReplacedByForceAndThenForItsOwnerAlone) {
 }
 
 TEST_F(TokenFile, ThatComesMeanwhileIsNotReplacedWithoutForce) {
-  TerminalSession session(ShellCommand("exec " + Line("stall-then-answer-4")), m_folder.Path());
-  AwaitLog("/sts/fault/stall-then-answer-4: issued");
+  TerminalSession session(ShellCommand("exec " + Line("stall-then-answer-10")), m_folder.Path());
+  AwaitLog("/sts/fault/stall-then-answer-10: issued");
   m_folder.Write("token.xml", "what came meanwhile");
   EXPECT_EQ(7, session.Finish());
   EXPECT_EQ("ssoclient: file: token.xml: is there already; --force replaces it\r\n", session.Shown());
