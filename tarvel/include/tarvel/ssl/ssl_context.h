@@ -60,7 +60,7 @@ public:
                                     const Crypto::CertificateList &intermediates) = 0;
 
   /// A TLS stream over `stream`, which is connected. `endpoint` ("host:port") is the key under which the session is
-  /// remembered for resumption.
+  /// remembered for resumption, once the TLS stream has been closed or released.
   virtual Ref<SSLStream> CreateStream(const Ref<System::Stream> &stream, const std::string &endpoint) = 0;
 
 protected:
