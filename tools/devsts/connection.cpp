@@ -1,13 +1,29 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "connection.h"
 
+#include "delivery.h"
+#include "request_handler.h"
+
 #include <boost/asio/buffer.hpp>
+#include <boost/asio/steady_timer.hpp>
 #include <boost/asio/write.hpp>
+#include <boost/beast/core/flat_buffer.hpp>
+#include <boost/beast/core/tcp_stream.hpp>
 #include <boost/beast/http/error.hpp>
+#include <boost/beast/http/parser.hpp>
 #include <boost/beast/http/read.hpp>
+#include <boost/beast/http/string_body.hpp>
+#include <boost/beast/ssl/ssl_stream.hpp>
 
 #include <chrono>
+#include <cstddef>
+#include <cstdint>
+#include <memory>
+#include <optional>
 #include <sstream>
+#include <string>
+#include <string_view>
+#include <utility>
 
 namespace DevSts {
 
@@ -36,7 +52,44 @@ std::string Field(const http::request<http::string_body> &message, std::string_v
   return std::string(message[boost::string_view(name.data(), name.size())]);
 }
 
-} // namespace
+/// Lives as long as an operation of it is under way. Everything runs on the strand of its socket.
+class Connection : public std::enable_shared_from_this<Connection> {
+public:
+  /// All references outlive the connection. `count` is one higher while it lives.
+  Connection(asio::ip::tcp::socket socket, asio::ssl::context &tls, const RequestHandler &handler,
+             std::atomic<int> &count);
+  Connection(const Connection &) = delete;
+  Connection &operator=(const Connection &) = delete;
+  ~Connection();
+
+  void Start();
+
+private:
+  using ErrorCode = beast::error_code;
+
+  void Read();
+  void OnRead(const ErrorCode &error);
+  void RefuseUnreadable(const ErrorCode &error);
+  void Begin(Delivery delivery);
+  void NextStep();
+  void WriteStep();
+  void Finish();
+  void Close();
+  void Linger();
+  void Reset();
+  void AwaitPeer();
+  HttpRequest TakeRequest();
+
+  beast::ssl_stream<beast::tcp_stream> m_stream;
+  asio::steady_timer m_timer;
+  const RequestHandler &m_handler;
+  std::atomic<int> &m_count;
+  std::string m_peer;
+  beast::flat_buffer m_buffer;
+  std::optional<http::request_parser<http::string_body>> m_parser;
+  Delivery m_delivery;
+  std::size_t m_step = 0;
+};
 
 Connection::Connection(asio::ip::tcp::socket socket, asio::ssl::context &tls, const RequestHandler &handler,
                        std::atomic<int> &count)
@@ -195,6 +248,13 @@ void Connection::AwaitPeer() {
       self->AwaitPeer();
     }
   });
+}
+
+} // namespace
+
+void StartConnection(asio::ip::tcp::socket socket, asio::ssl::context &tls, const RequestHandler &handler,
+                     std::atomic<int> &count) {
+  std::make_shared<Connection>(std::move(socket), tls, handler, count)->Start();
 }
 
 } // namespace DevSts

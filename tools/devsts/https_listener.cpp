@@ -2,14 +2,23 @@
 #include "https_listener.h"
 
 #include "connection.h"
+#include "request_handler.h"
+#include "state_folder.h"
 
+#include <boost/asio/io_context.hpp>
+#include <boost/asio/ip/tcp.hpp>
 #include <boost/asio/ip/v6_only.hpp>
+#include <boost/asio/ssl/context.hpp>
 #include <boost/asio/strand.hpp>
 #include <boost/system/system_error.hpp>
 
 #include <algorithm>
+#include <atomic>
 #include <chrono>
-#include <memory>
+#include <deque>
+#include <thread>
+#include <utility>
+#include <vector>
 
 namespace DevSts {
 
@@ -54,20 +63,43 @@ void SetUpTls(asio::ssl::context &tls, const Identity &identity) {
 
 } // namespace
 
-HttpsListener::HttpsListener(const Identity &identity, std::uint16_t port, const RequestHandler &handler)
+class HttpsListener::Server {
+public:
+  Server(const Identity &identity, std::uint16_t port, const RequestHandler &handler);
+  Server(const Server &) = delete;
+  Server &operator=(const Server &) = delete;
+  ~Server();
+
+  std::uint16_t GetPort() const noexcept { return m_port; }
+  void Start();
+
+private:
+  void Listen(std::uint16_t port);
+  void Accept(tcp::acceptor &acceptor);
+
+  std::atomic<int> m_connections{0};
+  asio::ssl::context m_tls;
+  asio::io_context m_context;
+  std::deque<tcp::acceptor> m_acceptors;
+  const RequestHandler &m_handler;
+  std::uint16_t m_port = 0;
+  std::vector<std::thread> m_threads;
+};
+
+HttpsListener::Server::Server(const Identity &identity, std::uint16_t port, const RequestHandler &handler)
     : m_tls(asio::ssl::context::tls_server), m_handler(handler) {
   SetUpTls(m_tls, identity);
   Listen(port);
 }
 
-HttpsListener::~HttpsListener() {
+HttpsListener::Server::~Server() {
   m_context.stop();
   for (std::thread &thread : m_threads) {
     thread.join();
   }
 }
 
-void HttpsListener::Listen(std::uint16_t port) {
+void HttpsListener::Server::Listen(std::uint16_t port) {
   // A port that is free on one address may be taken on the other; when any will do, another is tried.
   for (int left = port == 0 ? PORT_TRIES : 1;; --left) {
     m_acceptors.clear();
@@ -88,8 +120,8 @@ void HttpsListener::Listen(std::uint16_t port) {
   }
 }
 
-void HttpsListener::Start() {
-  for (Acceptor &acceptor : m_acceptors) {
+void HttpsListener::Server::Start() {
+  for (tcp::acceptor &acceptor : m_acceptors) {
     Accept(acceptor);
   }
   const unsigned count = std::max(LEAST_THREADS, std::thread::hardware_concurrency());
@@ -98,10 +130,10 @@ void HttpsListener::Start() {
   }
 }
 
-void HttpsListener::Accept(Acceptor &acceptor) {
+void HttpsListener::Server::Accept(tcp::acceptor &acceptor) {
   acceptor.async_accept(asio::make_strand(m_context), [this, &acceptor](const ErrorCode &error, tcp::socket socket) {
     if (!error && m_connections < MOST_CONNECTIONS) {
-      std::make_shared<Connection>(std::move(socket), m_tls, m_handler, m_connections)->Start();
+      StartConnection(std::move(socket), m_tls, m_handler, m_connections);
     }
     if (error) {
       LogLine("cannot take a connection: " + error.message());
@@ -109,6 +141,19 @@ void HttpsListener::Accept(Acceptor &acceptor) {
     }
     Accept(acceptor);
   });
+}
+
+HttpsListener::HttpsListener(const Identity &identity, std::uint16_t port, const RequestHandler &handler)
+    : m_server(std::make_unique<Server>(identity, port, handler)) {}
+
+HttpsListener::~HttpsListener() = default;
+
+std::uint16_t HttpsListener::GetPort() const noexcept {
+  return m_server->GetPort();
+}
+
+void HttpsListener::Start() {
+  m_server->Start();
 }
 
 } // namespace DevSts

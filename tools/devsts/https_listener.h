@@ -4,20 +4,13 @@
 
 #pragma once
 
-#include "request_handler.h"
-#include "state_folder.h"
-
-#include <boost/asio/io_context.hpp>
-#include <boost/asio/ip/tcp.hpp>
-#include <boost/asio/ssl/context.hpp>
-
-#include <atomic>
 #include <cstdint>
-#include <deque>
-#include <thread>
-#include <vector>
+#include <memory>
 
 namespace DevSts {
+
+struct Identity;
+class RequestHandler;
 
 class HttpsListener {
 public:
@@ -29,24 +22,14 @@ public:
   /// Ends all connections at once.
   ~HttpsListener();
 
-  std::uint16_t GetPort() const noexcept { return m_port; }
+  std::uint16_t GetPort() const noexcept;
 
   /// Starts to take connections, on threads of its own.
   void Start();
 
 private:
-  using Acceptor = boost::asio::ip::tcp::acceptor;
-
-  void Listen(std::uint16_t port);
-  void Accept(Acceptor &acceptor);
-
-  std::atomic<int> m_connections{0};
-  boost::asio::ssl::context m_tls;
-  boost::asio::io_context m_context;
-  std::deque<Acceptor> m_acceptors;
-  const RequestHandler &m_handler;
-  std::uint16_t m_port = 0;
-  std::vector<std::thread> m_threads;
+  class Server; // where Asio is, which takes seconds to compile
+  const std::unique_ptr<Server> m_server;
 };
 
 } // namespace DevSts

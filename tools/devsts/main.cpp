@@ -13,9 +13,13 @@
 
 #include <nlohmann/json.hpp>
 
+#include <cstdint>
 #include <cstdio>
+#include <exception>
 #include <stdexcept>
+#include <string>
 #include <utility>
+#include <variant>
 
 #include <sys/resource.h>
 #include <unistd.h>

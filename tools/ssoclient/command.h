@@ -7,9 +7,11 @@
 #include "exit_code.h"
 #include "output.h"
 
-#include <CLI/CLI.hpp>
-
 #include <functional>
+
+namespace CLI {
+class App;
+}
 
 namespace SsoClient::Tool {
 

@@ -3,11 +3,13 @@
 #include "connection.h"
 
 #include "exit_code.h"
+#include "option.h"
 
 #include <ssoclient/security_token_service_config.h>
 #include <tarvel/http/url.h>
 
 #include <algorithm>
+#include <cstddef>
 
 namespace SsoClient::Tool {
 namespace {
@@ -36,19 +38,18 @@ bool IsSecure(const std::string &url) {
 } // namespace
 
 void AddConnectionOptions(CLI::App &app, ConnectionOptions &options) {
-  app.add_option("--sts", options.url, "Address of the token service")->required()->type_name("URL")->group(GROUP);
-  CLI::Option *ca =
-      app.add_option("--ca", options.caFile,
-                     "File with the authorities that may vouch for the server, PEM; without it, the system's")
-          ->type_name("FILE")
-          ->group(GROUP);
-  app.add_option("--thumbprint", options.thumbprint,
-                 "SHA-256 of the server's certificate, which then needs no authority")
-      ->type_name("HEX")
-      ->group(GROUP)
-      ->excludes(ca);
-  app.add_flag("--allow-http", options.allowHttp, "Let passwords and tokens travel unprotected, to an http address")
-      ->group(GROUP);
+  AddOption(app, "--sts", options.url, "Address of the token service").Required().TypeName("URL").Group(GROUP);
+  const Option ca = AddOption(app, "--ca", options.caFile,
+                              "File with the authorities that may vouch for the server, PEM; without it, the system's")
+                        .TypeName("FILE")
+                        .Group(GROUP);
+  AddOption(app, "--thumbprint", options.thumbprint,
+            "SHA-256 of the server's certificate, which then needs no authority")
+      .TypeName("HEX")
+      .Group(GROUP)
+      .Excludes(ca);
+  AddFlag(app, "--allow-http", options.allowHttp, "Let passwords and tokens travel unprotected, to an http address")
+      .Group(GROUP);
 }
 
 void CheckConnection(const ConnectionOptions &options) {

@@ -12,10 +12,12 @@
 
 #include <boost/optional.hpp>
 
-#include <CLI/CLI.hpp>
-
 #include <memory>
 #include <string>
+
+namespace CLI {
+class App;
+}
 
 namespace SsoClient::Tool {
 

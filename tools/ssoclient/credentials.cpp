@@ -3,6 +3,7 @@
 #include "credentials.h"
 
 #include "exit_code.h"
+#include "option.h"
 
 namespace SsoClient::Tool {
 namespace {
@@ -65,38 +66,37 @@ constexpr CredentialsKind IDENTITY_ALONE = {nullptr, nullptr, CheckCertificate, 
 }
 
 void AddGssOptions(CLI::App &app, GssOptions &options) {
-  CLI::Option *gss =
-      app.add_flag("--gss", options.isChosen, "Acquire by a Kerberos ticket, negotiated through the GSSAPI")
-          ->group(GROUP);
-  app.add_option(
-         "--service", options.service,
-         "The token service's principal, as HTTP@host or HTTP/host@REALM; without it, HTTP at the address's host")
-      ->type_name("PRINCIPAL")
-      ->group(GROUP)
-      ->needs(gss);
-  app.add_option("--ccache", options.credentialCache, "Credential cache with the ticket; without it, the default one")
-      ->type_name("NAME")
-      ->group(GROUP)
-      ->needs(gss);
-  app.add_option("--client-keytab", options.clientKeytab,
-                 "Keytab to get a ticket with, which is kept only in the cache that --ccache names")
-      ->type_name("FILE")
-      ->group(GROUP)
-      ->needs(gss);
+  const Option gss =
+      AddFlag(app, "--gss", options.isChosen, "Acquire by a Kerberos ticket, negotiated through the GSSAPI")
+          .Group(GROUP);
+  AddOption(app, "--service", options.service,
+            "The token service's principal, as HTTP@host or HTTP/host@REALM; without it, HTTP at the address's host")
+      .TypeName("PRINCIPAL")
+      .Group(GROUP)
+      .Needs(gss);
+  AddOption(app, "--ccache", options.credentialCache, "Credential cache with the ticket; without it, the default one")
+      .TypeName("NAME")
+      .Group(GROUP)
+      .Needs(gss);
+  AddOption(app, "--client-keytab", options.clientKeytab,
+            "Keytab to get a ticket with, which is kept only in the cache that --ccache names")
+      .TypeName("FILE")
+      .Group(GROUP)
+      .Needs(gss);
 }
 
 } // namespace
 
 void AddCredentialsOptions(CLI::App &app, CredentialsOptions &options) {
-  CLI::Option *user =
-      app.add_option("--user", options.user, "Acquire by password, as this user")->type_name("NAME")->group(GROUP);
-  for (CLI::Option *source : AddSecretOptions(app, options.password, GROUP)) {
-    source->needs(user);
+  const Option user =
+      AddOption(app, "--user", options.user, "Acquire by password, as this user").TypeName("NAME").Group(GROUP);
+  for (const Option &source : AddSecretOptions(app, options.password, GROUP)) {
+    source.Needs(user);
   }
-  app.add_option("--token", options.tokenFile,
-                 "Acquire in exchange for this token, an XML file; \"-\" is standard input; needs an identity")
-      ->type_name("FILE")
-      ->group(GROUP);
+  AddOption(app, "--token", options.tokenFile,
+            "Acquire in exchange for this token, an XML file; \"-\" is standard input; needs an identity")
+      .TypeName("FILE")
+      .Group(GROUP);
   AddGssOptions(app, options.gss);
 }
 

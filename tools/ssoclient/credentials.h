@@ -13,10 +13,13 @@
 #include <ssoclient/security_token_service.h>
 #include <ssoclient/token_spec.h>
 
-#include <CLI/CLI.hpp>
-
+#include <cstdint>
 #include <memory>
 #include <string>
+
+namespace CLI {
+class App;
+}
 
 namespace SsoClient::Tool {
 

@@ -3,6 +3,7 @@
 #include "identity.h"
 
 #include "exit_code.h"
+#include "option.h"
 
 #include <tarvel/crypto/certificate.h>
 #include <tarvel/crypto/private_key.h>
@@ -32,18 +33,17 @@ HolderOfKeyConfig LoadPair(const IdentityOptions &options) {
 } // namespace
 
 void AddIdentityOptions(CLI::App &app, IdentityOptions &options) {
-  CLI::Option *certificate =
-      app.add_option("--cert", options.certificateFile, "Certificate of the key, PEM or DER; the first of a chain")
-          ->type_name("FILE")
-          ->group(GROUP);
-  CLI::Option *key = app.add_option("--key", options.key, "Private key that signs requests, a file or a key URI")
-                         ->type_name("FILE")
-                         ->group(GROUP);
-  CLI::Option *p12 = app.add_option("--p12", options.p12File, "Key and certificate in one PKCS#12 file")
-                         ->type_name("FILE")
-                         ->group(GROUP);
-  certificate->needs(key)->excludes(p12);
-  key->needs(certificate)->excludes(p12);
+  const Option certificate =
+      AddOption(app, "--cert", options.certificateFile, "Certificate of the key, PEM or DER; the first of a chain")
+          .TypeName("FILE")
+          .Group(GROUP);
+  const Option key = AddOption(app, "--key", options.key, "Private key that signs requests, a file or a key URI")
+                         .TypeName("FILE")
+                         .Group(GROUP);
+  const Option p12 =
+      AddOption(app, "--p12", options.p12File, "Key and certificate in one PKCS#12 file").TypeName("FILE").Group(GROUP);
+  certificate.Needs(key).Excludes(p12);
+  key.Needs(certificate).Excludes(p12);
   AddSecretOptions(app, options.passphrase, GROUP);
 }
 

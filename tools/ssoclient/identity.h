@@ -11,9 +11,11 @@
 
 #include <boost/optional.hpp>
 
-#include <CLI/CLI.hpp>
-
 #include <string>
+
+namespace CLI {
+class App;
+}
 
 namespace SsoClient::Tool {
 

@@ -9,6 +9,7 @@
 #include <tarvel/xml/parser.h>
 
 #include <memory>
+#include <string>
 
 namespace SsoClient::Tool {
 

@@ -7,7 +7,12 @@
 #include "interruption.h"
 #include "standard_streams.h"
 
+#include <CLI/CLI.hpp>
+
+#include <exception>
 #include <map>
+#include <string>
+#include <string_view>
 
 namespace SsoClient::Tool {
 namespace {

@@ -9,7 +9,9 @@
 #include "token_spec_options.h"
 #include "trust.h"
 
+#include <cstdint>
 #include <memory>
+#include <string>
 
 namespace SsoClient::Tool {
 namespace {

@@ -86,18 +86,18 @@ void Secret::Append(char octet) {
   m_text.push_back(octet);
 }
 
-std::vector<CLI::Option *> AddSecretOptions(CLI::App &app, SecretOptions &options, const std::string &group) {
+std::vector<Option> AddSecretOptions(CLI::App &app, SecretOptions &options, const std::string &group) {
   const std::string name = options.name;
-  CLI::Option *file = app.add_option("--" + name + "-file", options.file,
-                                     "File with the " + name + " in its first line; \"-\" is standard input")
-                          ->type_name("FILE")
-                          ->group(group);
-  CLI::Option *descriptor =
-      app.add_option("--" + name + "-fd", options.descriptor, "Open descriptor to read the " + name + " from, a line")
-          ->check(CLI::Range(0, MAX_DESCRIPTOR))
-          ->type_name("N")
-          ->group(group)
-          ->excludes(file);
+  const Option file = AddOption(app, "--" + name + "-file", options.file,
+                                "File with the " + name + " in its first line; \"-\" is standard input")
+                          .TypeName("FILE")
+                          .Group(group);
+  const Option descriptor =
+      AddOption(app, "--" + name + "-fd", options.descriptor, "Open descriptor to read the " + name + " from, a line")
+          .Within(0, MAX_DESCRIPTOR)
+          .TypeName("N")
+          .Group(group)
+          .Excludes(file);
   return {file, descriptor};
 }
 

@@ -5,12 +5,15 @@
 #pragma once
 
 #include "input_descriptor.h"
-
-#include <CLI/CLI.hpp>
+#include "option.h"
 
 #include <cstddef>
 #include <string>
 #include <vector>
+
+namespace CLI {
+class App;
+}
 
 namespace SsoClient::Tool {
 
@@ -42,7 +45,7 @@ struct SecretOptions {
 };
 
 /// Adds `--NAME-file` and `--NAME-fd`, which exclude each other, and returns them.
-std::vector<CLI::Option *> AddSecretOptions(CLI::App &app, SecretOptions &options, const std::string &group);
+std::vector<Option> AddSecretOptions(CLI::App &app, SecretOptions &options, const std::string &group);
 
 /// @throws UsageException when another option reads the same descriptor.
 void ClaimInput(const SecretOptions &options, InputClaims &claims);

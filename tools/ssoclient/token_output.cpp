@@ -4,6 +4,7 @@
 
 #include "atomic_file.h"
 #include "exit_code.h"
+#include "option.h"
 #include "token_report.h"
 
 namespace SsoClient::Tool {
@@ -15,12 +16,12 @@ constexpr const char *STANDARD_OUTPUT = "-";
 } // namespace
 
 void AddTokenOutputOptions(CLI::App &app, TokenOutputOptions &options) {
-  app.add_option("--out", options.file,
-                 "File for the token's XML, mode 0600, written whole or not at all; \"-\" is standard output, which "
-                 "then gets nothing else")
-      ->type_name("FILE")
-      ->group(GROUP);
-  app.add_flag("--force", options.replace, "Replace the file that is there already")->group(GROUP);
+  AddOption(app, "--out", options.file,
+            "File for the token's XML, mode 0600, written whole or not at all; \"-\" is standard output, which "
+            "then gets nothing else")
+      .TypeName("FILE")
+      .Group(GROUP);
+  AddFlag(app, "--force", options.replace, "Replace the file that is there already").Group(GROUP);
 }
 
 void CheckTokenOutput(const TokenOutputOptions &options, const OutputOptions &output) {

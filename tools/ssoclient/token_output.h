@@ -8,9 +8,11 @@
 
 #include <ssoclient/saml_token.h>
 
-#include <CLI/CLI.hpp>
-
 #include <string>
+
+namespace CLI {
+class App;
+}
 
 namespace SsoClient::Tool {
 

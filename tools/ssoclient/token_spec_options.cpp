@@ -3,9 +3,12 @@
 #include "token_spec_options.h"
 
 #include "exit_code.h"
+#include "option.h"
 
 #include <algorithm>
 #include <charconv>
+#include <cstddef>
+#include <system_error>
 
 namespace SsoClient::Tool {
 namespace {
@@ -65,30 +68,28 @@ Element &FindOrAdd(std::vector<Element> &list, std::string Element::*key, const 
 } // namespace
 
 void AddLifetimeOption(CLI::App &app, std::string &lifetime) {
-  app.add_option("--lifetime", lifetime, "How long the token is to be valid: a number and s, m, h or d")
-      ->capture_default_str()
-      ->type_name("TIME")
-      ->group(GROUP);
+  AddOption(app, "--lifetime", lifetime, "How long the token is to be valid: a number and s, m, h or d")
+      .ShowDefault()
+      .TypeName("TIME")
+      .Group(GROUP);
 }
 
 void AddTokenSpecOptions(CLI::App &app, TokenSpecOptions &options) {
   AddLifetimeOption(app, options.lifetime);
-  app.add_option("--audience", options.audience, "Who may accept the token; may be given again")
-      ->allow_extra_args(false)
-      ->type_name("URI")
-      ->group(GROUP);
-  app.add_option("--delegate-to", options.delegateTo, "Who is to act for the subject with the token")
-      ->type_name("NAME")
-      ->group(GROUP);
-  app.add_flag("--delegable", options.delegable, "The token may be delegated")->group(GROUP);
-  app.add_flag("--renewable", options.renewable, "The token may be renewed")->group(GROUP);
-  app.add_flag("--bearer", options.bearer, "A token that is good without a key, although there is an identity")
-      ->group(GROUP);
-  app.add_option("--advice", options.advice,
-                 "Advice to put into the token; may be given again; a backslash before a colon that is part of NAME")
-      ->allow_extra_args(false)
-      ->type_name("SOURCE:NAME=VALUE")
-      ->group(GROUP);
+  AddOption(app, "--audience", options.audience, "Who may accept the token; may be given again")
+      .TypeName("URI")
+      .Group(GROUP);
+  AddOption(app, "--delegate-to", options.delegateTo, "Who is to act for the subject with the token")
+      .TypeName("NAME")
+      .Group(GROUP);
+  AddFlag(app, "--delegable", options.delegable, "The token may be delegated").Group(GROUP);
+  AddFlag(app, "--renewable", options.renewable, "The token may be renewed").Group(GROUP);
+  AddFlag(app, "--bearer", options.bearer, "A token that is good without a key, although there is an identity")
+      .Group(GROUP);
+  AddOption(app, "--advice", options.advice,
+            "Advice to put into the token; may be given again; a backslash before a colon that is part of NAME")
+      .TypeName("SOURCE:NAME=VALUE")
+      .Group(GROUP);
 }
 
 std::int64_t ParseLifetime(std::string_view text) {

@@ -7,12 +7,14 @@
 #include <ssoclient/advice.h>
 #include <ssoclient/token_spec.h>
 
-#include <CLI/CLI.hpp>
-
 #include <cstdint>
 #include <string>
 #include <string_view>
 #include <vector>
+
+namespace CLI {
+class App;
+}
 
 namespace SsoClient::Tool {
 

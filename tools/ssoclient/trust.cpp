@@ -2,6 +2,8 @@
 
 #include "trust.h"
 
+#include "option.h"
+
 #include <tarvel/system/date_time.h>
 #include <tarvel/xml/parser.h>
 
@@ -26,18 +28,17 @@ void WarnOfDates(const Tarvel::Crypto::CertificateList &trusted) {
 } // namespace
 
 void AddTrustOptions(CLI::App &app, TrustOptions &options) {
-  app.add_option("--trust", options.files,
-                 "File with certificates of the service whose keys are trusted, PEM or DER; may be given again")
-      ->required()
-      ->allow_extra_args(false)
-      ->type_name("CERT");
-  app.add_option("--tolerance", options.toleranceSec, "How far this machine's clock may be off, in seconds")
-      ->capture_default_str()
-      ->type_name("S");
+  AddOption(app, "--trust", options.files,
+            "File with certificates of the service whose keys are trusted, PEM or DER; may be given again")
+      .Required()
+      .TypeName("CERT");
+  AddOption(app, "--tolerance", options.toleranceSec, "How far this machine's clock may be off, in seconds")
+      .ShowDefault()
+      .TypeName("S");
 }
 
 void AddTokenArgument(CLI::App &app, std::string &file) {
-  app.add_option("FILE", file, "The token, an XML file; \"-\" is standard input")->required()->type_name("");
+  AddOption(app, "FILE", file, "The token, an XML file; \"-\" is standard input").Required().TypeName("");
 }
 
 Tarvel::Crypto::CertificateList LoadTrusted(const TrustOptions &options, const OutputOptions &output) {

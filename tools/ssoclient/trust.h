@@ -10,12 +10,14 @@
 #include <ssoclient/saml_token.h>
 #include <tarvel/crypto/certificate.h>
 
-#include <CLI/CLI.hpp>
-
 #include <cstdint>
 #include <memory>
 #include <string>
 #include <vector>
+
+namespace CLI {
+class App;
+}
 
 namespace SsoClient::Tool {
 

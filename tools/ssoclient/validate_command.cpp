@@ -7,6 +7,7 @@
 #include "trust.h"
 
 #include <memory>
+#include <string>
 
 namespace SsoClient::Tool {
 namespace {
