@@ -4,11 +4,7 @@
 
 #pragma once
 
-#include "system/io_engine.h"
-
 #include <tarvel/core/exception.h>
-
-#include <boost/asio/post.hpp>
 
 #include <chrono>
 #include <condition_variable>
@@ -36,48 +32,23 @@ public:
   }
 
   /// Whether the handler has been called, which is waited for.
-  bool Wait() const {
-    std::unique_lock<std::mutex> lock(m_state->mutex);
-    return m_state->called.wait_for(lock, PATIENCE, [this] { return m_state->calls > 0; });
-  }
+  bool Wait() const;
 
-  int GetCalls() const {
-    const std::lock_guard<std::mutex> lock(m_state->mutex);
-    return m_state->calls;
-  }
+  int GetCalls() const;
 
   /// The outcome, once there is one: the message of the exception, "" for none, "(never called)".
-  std::string GetMessage() const {
-    if (!Wait()) {
-      return "(never called)";
-    }
-    const std::lock_guard<std::mutex> lock(m_state->mutex);
-    return m_state->failure ? m_state->failure->what() : "";
-  }
+  std::string GetMessage() const;
 
   template <typename Expected>
   bool FailedWith() const {
-    Wait();
-    const std::lock_guard<std::mutex> lock(m_state->mutex);
-    const Tarvel::Exception *const failure = m_state->failure.get();
-    return failure && typeid(*failure) == typeid(Expected);
+    return FailedWith(typeid(Expected));
   }
 
-  std::size_t GetCount() const {
-    Wait();
-    const std::lock_guard<std::mutex> lock(m_state->mutex);
-    return m_state->count;
-  }
+  std::size_t GetCount() const;
 
 private:
   struct State {
-    void Note(std::size_t moved, const Tarvel::Exception *exception) {
-      const std::lock_guard<std::mutex> lock(mutex);
-      ++calls;
-      count = moved;
-      failure.reset(exception ? exception->Clone() : nullptr);
-      called.notify_all();
-    }
+    void Note(std::size_t moved, const Tarvel::Exception *exception);
 
     std::mutex mutex;
     std::condition_variable called;
@@ -86,26 +57,12 @@ private:
     std::unique_ptr<const Tarvel::Exception> failure;
   };
 
+  bool FailedWith(const std::type_info &expected) const;
+
   std::shared_ptr<State> m_state = std::make_shared<State>();
 };
 
 /// Waits until all that was due on the I/O threads has run: both must be free at the same time.
-inline bool DrainIoThreads() {
-  struct Meeting {
-    std::mutex mutex;
-    std::condition_variable changed;
-    int present = 0;
-  };
-  const auto meeting = std::make_shared<Meeting>();
-  const auto attend = [meeting] {
-    std::unique_lock<std::mutex> lock(meeting->mutex);
-    ++meeting->present;
-    meeting->changed.notify_all();
-    return meeting->changed.wait_for(lock, PATIENCE, [&meeting] { return meeting->present == 3; });
-  };
-  boost::asio::post(Tarvel::System::GetIoContext(), attend);
-  boost::asio::post(Tarvel::System::GetIoContext(), attend);
-  return attend();
-}
+bool DrainIoThreads();
 
 } // namespace Testing

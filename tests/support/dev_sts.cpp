@@ -2,7 +2,7 @@
 
 #include "support/dev_sts.h"
 
-#include <nlohmann/json.hpp>
+#include "support/json_object.h"
 
 #include <algorithm>
 #include <array>
@@ -32,14 +32,6 @@ namespace {
 
 constexpr std::chrono::seconds READY_LIMIT(120); // six RSA keys under a sanitizer, on a busy machine
 constexpr int END_MILLISECONDS = 60000;
-
-#ifdef SSOCLIENT_DEVSTS
-constexpr const char *PROGRAM = SSOCLIENT_DEVSTS;
-constexpr const char *STATE = SSOCLIENT_DEVSTS_STATE;
-#else
-constexpr const char *PROGRAM = "";
-constexpr const char *STATE = "";
-#endif
 
 void Require(bool condition, const std::string &what) {
   if (!condition) {
@@ -96,15 +88,11 @@ DevSts::~DevSts() {
   Close();
 }
 
-const char *DevSts::GetProgram() noexcept {
-  return PROGRAM;
-}
-
 void DevSts::Start(const std::vector<std::string> &arguments) {
-  Require(*PROGRAM != '\0', "not built, because libxmlsec1 is missing");
-  std::vector<std::string> line = {PROGRAM, "--until-eof"};
+  Require(*GetProgram() != '\0', "not built, because libxmlsec1 is missing");
+  std::vector<std::string> line = {GetProgram(), "--until-eof"};
   if (std::find(arguments.begin(), arguments.end(), "--state") == arguments.end()) {
-    line.insert(line.end(), {"--state", STATE});
+    line.insert(line.end(), {"--state", GetUsualState()});
   }
   line.insert(line.end(), arguments.begin(), arguments.end());
   std::vector<char *> raw;
@@ -121,7 +109,7 @@ void DevSts::Start(const std::vector<std::string> &arguments) {
   posix_spawn_file_actions_adddup2(&actions, in.ends[0], STDIN_FILENO);
   posix_spawn_file_actions_adddup2(&actions, out.ends[1], STDOUT_FILENO);
   posix_spawn_file_actions_adddup2(&actions, m_log, STDERR_FILENO);
-  const int error = ::posix_spawn(&m_process, PROGRAM, &actions, nullptr, raw.data(), environ);
+  const int error = ::posix_spawn(&m_process, GetProgram(), &actions, nullptr, raw.data(), environ);
   posix_spawn_file_actions_destroy(&actions);
   if (error != 0) {
     m_process = -1;
@@ -148,11 +136,11 @@ void DevSts::ReadReadyLine() {
   }
   m_rest = m_readyLine.substr(m_readyLine.find('\n') + 1);
   m_readyLine.resize(m_readyLine.find('\n'));
-  const nlohmann::json ready = nlohmann::json::parse(m_readyLine);
-  m_url = ready.at("url");
-  m_port = ready.at("port");
-  m_thumbprint = ready.at("thumbprint");
-  m_folder = std::filesystem::path(ready.at("ca").get<std::string>()).parent_path();
+  const JsonObject ready = ReadJsonObject(m_readyLine);
+  m_url = ready.texts.at("url");
+  m_port = static_cast<int>(ready.numbers.at("port"));
+  m_thumbprint = ready.texts.at("thumbprint");
+  m_folder = std::filesystem::path(ready.texts.at("ca")).parent_path();
 }
 
 std::string DevSts::ReadStateFile(std::string_view file) const {

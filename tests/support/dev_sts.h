@@ -54,6 +54,9 @@ public:
   ProcessEnd End(int signal = 0);
 
 private:
+  /// The path of the state folder that services use which are given none.
+  static const char *GetUsualState() noexcept;
+
   void Start(const std::vector<std::string> &arguments);
   void ReadReadyLine();
   bool AwaitEnd(int milliseconds, int &status) noexcept;

@@ -5,31 +5,16 @@
 #pragma once
 
 #include "support/completion.h"
-#include "support/sanitized.h"
 
 #include <chrono>
 #include <cstddef>
-#include <filesystem>
-#include <iterator>
 #include <thread>
 
 namespace Testing {
 
-inline std::size_t CountEntries(const char *directory) {
-  const std::filesystem::directory_iterator entries(directory);
-  return static_cast<std::size_t>(std::distance(begin(entries), end(entries)));
-}
+std::size_t CountDescriptors();
 
-inline std::size_t CountDescriptors() {
-  return CountEntries("/proc/self/fd");
-}
-
-inline std::size_t CountThreads() {
-  // ThreadSanitizer's own thread starts with the first one of the process: it must not count as ours.
-  static const bool started = (std::thread([] {}).join(), true);
-  static_cast<void>(started);
-  return CountEntries("/proc/self/task");
-}
+std::size_t CountThreads();
 
 /// Whether `condition` comes true in bounded time. For what ends in the kernel, which notifies nobody.
 template <typename Condition>

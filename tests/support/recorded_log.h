@@ -6,9 +6,6 @@
 
 #include "support/rendezvous.h"
 
-#include <ssoclient/logger.h>
-#include <tarvel/service/app.h>
-
 #include <memory>
 #include <mutex>
 #include <set>
@@ -21,31 +18,15 @@ namespace Testing {
 /// Takes the process's one log sink. Lines have the form "LOGGER LEVEL MESSAGE".
 class RecordedLog {
 public:
-  RecordedLog() {
-    Tarvel::Service::GetApp().GetRootLogger()->SetSink([state = m_state](const Tarvel::Service::LogRecord &record) {
-      {
-        const std::lock_guard<std::mutex> lock(state->mutex);
-        state->lines.push_back(std::string(record.logger) + " " + std::to_string(record.level) + " " +
-                               std::string(record.message));
-        state->threads.insert(std::this_thread::get_id());
-      }
-      state->written.Add();
-    });
-  }
+  RecordedLog();
   RecordedLog(const RecordedLog &) = delete;
   RecordedLog &operator=(const RecordedLog &) = delete;
-  ~RecordedLog() { Tarvel::Service::GetApp().GetRootLogger()->SetSink({}); }
+  ~RecordedLog();
 
-  std::vector<std::string> Lines() const {
-    const std::lock_guard<std::mutex> lock(m_state->mutex);
-    return m_state->lines;
-  }
+  std::vector<std::string> Lines() const;
 
   /// The threads that wrote the lines.
-  std::set<std::thread::id> Threads() const {
-    const std::lock_guard<std::mutex> lock(m_state->mutex);
-    return m_state->threads;
-  }
+  std::set<std::thread::id> Threads() const;
 
   bool WaitForLines(int count) const { return m_state->written.WaitFor(count); }
 
@@ -57,18 +38,16 @@ private:
     EventCount written;
   };
 
-  const std::shared_ptr<State> m_state = std::make_shared<State>();
+  const std::shared_ptr<State> m_state;
 };
 
 /// The level of the client's logger, until the end of the scope.
 class ScopedLogLevel {
 public:
-  explicit ScopedLogLevel(int level) : m_previous(SsoClient::getLogger().GetLevel()) {
-    SsoClient::getLogger().SetLevel(level);
-  }
+  explicit ScopedLogLevel(int level);
   ScopedLogLevel(const ScopedLogLevel &) = delete;
   ScopedLogLevel &operator=(const ScopedLogLevel &) = delete;
-  ~ScopedLogLevel() { SsoClient::getLogger().SetLevel(m_previous); }
+  ~ScopedLogLevel();
 
 private:
   const int m_previous;

@@ -4,34 +4,20 @@
 
 #pragma once
 
-#include <chrono>
 #include <condition_variable>
 #include <mutex>
 
 namespace Testing {
 
-/// Far longer than anything that is waited for here, also under a sanitizer on a machine that is busy.
-constexpr std::chrono::seconds RENDEZVOUS_PATIENCE{120};
-
 /// Counts what happens on any thread.
 class EventCount {
 public:
-  void Add() {
-    const std::lock_guard<std::mutex> lock(m_mutex);
-    ++m_count;
-    m_changed.notify_all();
-  }
+  void Add();
 
   /// Whether there have been that many at least, which is waited for.
-  bool WaitFor(int count) const {
-    std::unique_lock<std::mutex> lock(m_mutex);
-    return m_changed.wait_for(lock, RENDEZVOUS_PATIENCE, [&] { return m_count >= count; });
-  }
+  bool WaitFor(int count) const;
 
-  int Get() const {
-    const std::lock_guard<std::mutex> lock(m_mutex);
-    return m_count;
-  }
+  int Get() const;
 
 private:
   mutable std::mutex m_mutex;
@@ -42,17 +28,9 @@ private:
 /// Closed at first: who passes waits until it is open.
 class Gate {
 public:
-  void Pass() {
-    m_arrived.Add();
-    std::unique_lock<std::mutex> lock(m_mutex);
-    m_opened.wait_for(lock, RENDEZVOUS_PATIENCE, [this] { return m_isOpen; });
-  }
+  void Pass();
 
-  void Open() {
-    const std::lock_guard<std::mutex> lock(m_mutex);
-    m_isOpen = true;
-    m_opened.notify_all();
-  }
+  void Open();
 
   /// Whether that many have come to the gate, which is waited for.
   bool WaitForArrivals(int count) const { return m_arrived.WaitFor(count); }

@@ -2,6 +2,8 @@
 
 #include "support/scripted_server.h"
 
+#include "support/data_file.h"
+
 #include <openssl/err.h>
 #include <openssl/ssl.h>
 
@@ -35,7 +37,7 @@ void Require(bool condition, const char *what) {
 }
 
 std::string TlsFile(const std::string &name) {
-  return TEST_DATA_DIR "/tls/" + name;
+  return DataPath("tls/" + name);
 }
 
 SSL_CTX *CreateTls(const TlsSettings &settings) {
@@ -314,6 +316,7 @@ ScriptedServer::ScriptedServer(Script script, std::optional<TlsSettings> tls, bo
 
 ScriptedServer::~ScriptedServer() {
   m_stopping = true;
+  ::shutdown(m_listener, SHUT_RDWR); // wakes the acceptor
   m_acceptor.join();
   ::close(m_listener);
   {

@@ -3,10 +3,10 @@
 
 #include "messages.h"
 
+#include "support/json_object.h"
 #include "support/work_folder.h"
 
 #include <gmock/gmock.h>
-#include <nlohmann/json.hpp>
 
 #include <csignal>
 #include <cstdio>
@@ -80,16 +80,16 @@ TEST(Process, ThatEndsBadlyFailsTheTestsThatUseIt) {
 
 TEST(Process, ReadyLineTellsAddressAndFiles) {
   const DevSts service;
-  const nlohmann::json ready = nlohmann::json::parse(service.GetReadyLine());
-  EXPECT_EQ(ready.at("schema"), 1);
-  EXPECT_EQ(ready.at("url"), "https://localhost:" + std::to_string(service.GetPort()) + "/sts");
-  EXPECT_EQ(ready.at("port"), service.GetPort());
-  EXPECT_EQ(ready.at("pid"), service.GetProcess());
-  EXPECT_EQ(ready.at("ca"), service.PathOf("authority.crt"));
-  EXPECT_EQ(ready.at("trust"), service.PathOf("signing.crt"));
-  EXPECT_THAT(ready.at("thumbprint").get<std::string>(), testing::MatchesRegex("[0-9a-f]{64}"));
-  EXPECT_TRUE(fs::path(ready.at("ca").get<std::string>()).is_absolute());
-  EXPECT_EQ(ready.size(), 7U);
+  const Testing::JsonObject ready = Testing::ReadJsonObject(service.GetReadyLine());
+  EXPECT_EQ(ready.numbers.at("schema"), 1);
+  EXPECT_EQ(ready.texts.at("url"), "https://localhost:" + std::to_string(service.GetPort()) + "/sts");
+  EXPECT_EQ(ready.numbers.at("port"), service.GetPort());
+  EXPECT_EQ(ready.numbers.at("pid"), service.GetProcess());
+  EXPECT_EQ(ready.texts.at("ca"), service.PathOf("authority.crt"));
+  EXPECT_EQ(ready.texts.at("trust"), service.PathOf("signing.crt"));
+  EXPECT_THAT(ready.texts.at("thumbprint"), testing::MatchesRegex("[0-9a-f]{64}"));
+  EXPECT_TRUE(fs::path(ready.texts.at("ca")).is_absolute());
+  EXPECT_EQ(ready.texts.size() + ready.numbers.size(), 7U);
 }
 
 TEST(Process, ListensOnBothLoopbackAddresses) {

@@ -1,6 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 // Which descriptions an operation computes, and with which values a service's client is made.
 #include "support/counting_token.h"
+#include "support/data_file.h"
 #include "support/posting_server.h"
 #include "support/recorded_log.h"
 #include "support/service_stand_ins.h"

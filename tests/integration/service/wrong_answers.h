@@ -4,12 +4,8 @@
 
 #pragma once
 
-#include <ssoclient/exceptions.h>
-
-#include <exception>
-#include <regex>
+#include <functional>
 #include <string>
-#include <typeinfo>
 
 namespace Testing {
 
@@ -19,40 +15,6 @@ struct WrongAnswer {
   /// reduced: lines, columns and lengths to "#", dates to "DATE".
   const char *outcome;
 };
-
-/// The class's name; of one that is not expected anywhere, what the compiler calls it.
-inline std::string ClassOf(const std::exception &exception) {
-  const struct {
-    const std::type_info &type;
-    const char *name;
-  } classes[] = {{typeid(SsoClient::SsoException), "SsoException"},
-                 {typeid(SsoClient::InvalidCredentialsException), "InvalidCredentialsException"},
-                 {typeid(SsoClient::CommunicationException), "CommunicationException"},
-                 {typeid(SsoClient::InvalidSignatureException), "InvalidSignatureException"},
-                 {typeid(SsoClient::ParseException), "ParseException"}};
-  for (const auto &known : classes) {
-    if (known.type == typeid(exception)) {
-      return known.name;
-    }
-  }
-  return typeid(exception).name();
-}
-
-/// The message as `WrongAnswer` has it, of the service that listens at `port`.
-inline std::string Reduce(std::string message, int port) {
-  const struct {
-    std::string pattern;
-    const char *replacement;
-  } reductions[] = {{"localhost:" + std::to_string(port), "%e"},
-                    {"line [0-9]+, column", "line #, column"},
-                    {"column [0-9]+", "column #"},
-                    {"after [0-9]+ of the body's [0-9]+ bytes", "after # of the body's # bytes"},
-                    {R"(\d{4}-\d\d-\d\dT\d\d:\d\d:\d\d\.\d{3}Z)", "DATE"}};
-  for (const auto &reduction : reductions) {
-    message = std::regex_replace(message, std::regex(reduction.pattern), reduction.replacement);
-  }
-  return message;
-}
 
 /// Whatever was asked for.
 inline const WrongAnswer TO_ALL[] = {
@@ -117,14 +79,8 @@ inline const WrongAnswer INSTEAD_OF_A_TOKEN[] = {
     {"wrong-version", "SsoException: Invalid token version"},
 };
 
-/// How `operation` ends: with what it returns, or with "CLASS: MESSAGE" as in `WrongAnswer`.
-template <typename Operation>
-std::string OutcomeOf(const Operation &operation, int port) {
-  try {
-    return operation();
-  } catch (const std::exception &exception) {
-    return ClassOf(exception) + ": " + Reduce(exception.what(), port);
-  }
-}
+/// How `operation` ends, on the service that listens at `port`: with what it returns, or with "CLASS: MESSAGE" as in
+/// `WrongAnswer`.
+std::string OutcomeOf(const std::function<std::string()> &operation, int port);
 
 } // namespace Testing

@@ -5,6 +5,8 @@
 #include "support/completion.h"
 #include "support/operations_in_turn.h"
 #include "support/process_resources.h"
+#include "support/repetitions.h"
+#include "support/sanitized.h"
 
 #include <gtest/gtest.h>
 
@@ -24,8 +26,7 @@ using Testing::CountDescriptors;
 constexpr std::size_t MOST_BYTES_OF_GROWTH = 131072;
 
 TEST(OneServiceOnSixteenThreadsOverTls, RunsTwentyThousandOperationsWithoutErrorOrGrowth) {
-  // Under a sanitizer a tenth of them, which takes as long as all do elsewhere.
-  constexpr int COUNT = Testing::IS_SANITIZED ? 2000 : 20000;
+  const int count = Testing::Repetitions(20000, 2000);
   constexpr int FIRST = 800; // after which whatever is made once is there
   const Testing::CannedService server;
   const auto allEnded = [&] { return server.CountOpenConnections() == 0; };
@@ -39,10 +40,10 @@ TEST(OneServiceOnSixteenThreadsOverTls, RunsTwentyThousandOperationsWithoutError
 
   const std::size_t bytes = CountAllocatedBytes();
   const std::size_t descriptors = CountDescriptors();
-  operations.RunOnSixteenThreads(COUNT);
+  operations.RunOnSixteenThreads(count);
   EXPECT_EQ(operations.GetFailure(), "");
-  EXPECT_EQ(operations.CountSuccesses(), FIRST + COUNT);
-  EXPECT_EQ(server.CountConnections(), FIRST + COUNT);
+  EXPECT_EQ(operations.CountSuccesses(), FIRST + count);
+  EXPECT_EQ(server.CountConnections(), FIRST + count);
   ASSERT_TRUE(Testing::Eventually(allEnded));
   EXPECT_TRUE(Testing::Eventually([&] { return CountDescriptors() <= descriptors; })) << CountDescriptors();
   EXPECT_TRUE(Testing::Eventually([&] { return CountAllocatedBytes() <= bytes + MOST_BYTES_OF_GROWTH; }))

@@ -6,6 +6,9 @@
 #include "signature_template.h"
 #include "xmlsec_oracle.h"
 
+#include "support/data_file.h"
+#include "support/repetitions.h"
+
 #include <tarvel/crypto/certificate.h>
 #include <tarvel/crypto/private_key.h>
 #include <tarvel/io/reader.h>
@@ -30,10 +33,10 @@ using Tarvel::Xml::Security::KeyInfoResolver;
 using Tarvel::Xml::Security::Signature;
 using Testing::RandomSource;
 
-constexpr std::size_t DOCUMENTS = ORACLE_DOCUMENTS; // for each algorithm
-constexpr std::size_t CHANGES = 4;                  // signing is dear: so many documents come from one signature
+const std::size_t DOCUMENTS = Testing::Repetitions<std::size_t>(10000, 2000); // for each algorithm
+constexpr std::size_t CHANGES = 4; // signing is dear: so many documents come from one signature
 
-const std::string KEYS = TEST_DATA_DIR "/tokens/";
+const std::string KEYS = Testing::DataPath("tokens/");
 
 Ref<Document> Parse(const std::string &text) {
   const Ref<Tarvel::Object> result =
@@ -163,7 +166,7 @@ TEST_P(XmlSecOracle, AgreesWithUsOnGeneratedDocuments) {
       [&key](xmlDoc &document) { return Testing::VerifiesWithXmlSec(document, *key); });
 }
 
-constexpr SignedBy ALGORITHMS[] = {
+const SignedBy ALGORITHMS[] = {
     {"RsaSha256", Uri::RSA_SHA256, "sts-rsa", 11},
     {"RsaSha384", Uri::RSA_SHA384, "sts-rsa", 12},
     {"RsaSha512", Uri::RSA_SHA512, "sts-rsa", 13},
@@ -190,9 +193,9 @@ TEST_P(PssOracle, AgreesWithUsOnGeneratedDocuments) {
       [&oracle](xmlDoc &document) { return oracle.Verifies(document); });
 }
 
-constexpr SignedBy PSS_ALGORITHMS[] = {{"SHA256", Uri::RSA_PSS_SHA256, "sts-rsa", 21},
-                                       {"SHA384", Uri::RSA_PSS_SHA384, "sts-rsa", 22},
-                                       {"SHA512", Uri::RSA_PSS_SHA512, "sts-rsa", 23}};
+const SignedBy PSS_ALGORITHMS[] = {{"SHA256", Uri::RSA_PSS_SHA256, "sts-rsa", 21},
+                                   {"SHA384", Uri::RSA_PSS_SHA384, "sts-rsa", 22},
+                                   {"SHA512", Uri::RSA_PSS_SHA512, "sts-rsa", 23}};
 
 INSTANTIATE_TEST_SUITE_P(All, PssOracle, ::testing::ValuesIn(PSS_ALGORITHMS), NameOf);
 

@@ -11,7 +11,9 @@
 #include "exchange/request_builder_impl.h"
 #include "integration/signed_requests/foreign_document.h"
 #include "support/data_file.h"
+#include "support/identity.h"
 #include "support/sample_requests.h"
+#include "support/token_stand_in.h"
 
 #include <libxml/xmlIO.h>
 #include <libxml/xmlschemas.h>
@@ -42,7 +44,7 @@ class Schemas {
 public:
   Schemas() {
     xmlSetExternalEntityLoader(xmlNoNetExternalEntityLoader);
-    const std::string path = std::string(TEST_DATA_DIR) + "/schemas/request.xsd";
+    const std::string path = DataPath("schemas/request.xsd");
     std::string warnings; // an import that was imported already, more than once
     const std::unique_ptr<xmlSchemaParserCtxt, decltype(&xmlSchemaFreeParserCtxt)> parser(
         xmlSchemaNewParserCtxt(path.c_str()), &xmlSchemaFreeParserCtxt);

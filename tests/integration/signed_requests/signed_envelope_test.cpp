@@ -1,7 +1,11 @@
 // SPDX-License-Identifier: Apache-2.0
 // What we sign, xmlsec1 verifies; what anybody changes afterwards, it refuses.
+#include "exchange/request_builder_impl.h"
 #include "integration/signed_requests/foreign_document.h"
+#include "support/data_file.h"
+#include "support/identity.h"
 #include "support/sample_requests.h"
+#include "support/token_stand_in.h"
 
 #include <tarvel/core/string_util.h>
 

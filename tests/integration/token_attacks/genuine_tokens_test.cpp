@@ -31,7 +31,7 @@ TEST(GenuineTokens, AreAcceptedButForThoseOutOfDateOrSignedByNobodyTrusted) {
                                      "algorithm \"http://www.w3.org/2001/04/xmldsig-more#rsa-sha256\""}},
   };
   int accepted = 0;
-  for (const auto &entry : std::filesystem::directory_iterator(TEST_DATA_DIR "/tokens")) {
+  for (const auto &entry : std::filesystem::directory_iterator(Testing::DataPath("tokens"))) {
     if (entry.path().extension() != ".xml") {
       continue;
     }

@@ -3,6 +3,7 @@
 // and no faster. Cost is counted in octets allocated, which no load on the machine can change.
 
 #include "outcome.h"
+#include "support/data_file.h"
 #include "support/work_folder.h"
 
 #include <tarvel/xml/parser.h>
@@ -179,9 +180,9 @@ protected:
     const Testing::WorkFolder folder;
     const std::string in = folder.Write("in.xml", xml);
     const std::string out = folder / "out.xml";
-    const std::string command = "xmlsec1 --sign --privkey-pem " TEST_DATA_DIR "/tokens/sts-rsa.key --id-attr:ID "
-                                "urn:oasis:names:tc:SAML:2.0:assertion:Assertion --output " +
-                                out + " " + in + " 2>" + folder / "log";
+    const std::string command = "xmlsec1 --sign --privkey-pem " + Testing::DataPath("tokens/sts-rsa.key") +
+                                " --id-attr:ID urn:oasis:names:tc:SAML:2.0:assertion:Assertion --output " + out + " " +
+                                in + " 2>" + folder / "log";
     ASSERT_EQ(0, std::system(command.c_str()));
     m_xml = folder.Read("out.xml");
   }

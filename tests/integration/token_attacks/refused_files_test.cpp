@@ -71,7 +71,7 @@ TEST(AttackFiles, AreAllInTheTable) {
     inTable.insert(row.file);
   }
   std::set<std::string> inFolder;
-  for (const auto &entry : std::filesystem::directory_iterator(TEST_DATA_DIR "/attacks")) {
+  for (const auto &entry : std::filesystem::directory_iterator(Testing::DataPath("attacks"))) {
     if (entry.path().extension() == ".xml") {
       inFolder.insert(entry.path().stem());
     }

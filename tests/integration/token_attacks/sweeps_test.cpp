@@ -3,7 +3,8 @@
 // never a token that says something else than what was signed.
 
 #include "outcome.h"
-#include "support/sanitized.h"
+#include "support/data_file.h"
+#include "support/repetitions.h"
 
 #include <gtest/gtest.h>
 
@@ -17,7 +18,7 @@ namespace {
 
 std::vector<std::string> TokenNames() {
   std::vector<std::string> names;
-  for (const auto &entry : std::filesystem::directory_iterator(TEST_DATA_DIR "/tokens")) {
+  for (const auto &entry : std::filesystem::directory_iterator(Testing::DataPath("tokens"))) {
     if (entry.path().extension() == ".xml") {
       names.push_back(entry.path().stem());
     }
@@ -39,8 +40,8 @@ TEST_P(Truncation, EveryPrefixIsRefusedByTheParser) {
   const Outcome whole = TryToken(xml);
   // Beyond the end tag only comments and white space follow, and to cut those is no harm.
   const std::size_t rootEnd = xml.rfind("Assertion>") + std::string("Assertion>").size();
-  // The large token repeats one line; under a sanitizer, a prime step visits each place of that line.
-  const std::size_t step = Testing::IS_SANITIZED && xml.size() > 20000 ? 61 : 1;
+  // The large token repeats one line, and a prime step visits each place of that line.
+  const std::size_t step = xml.size() > 20000 ? Testing::Repetitions<std::size_t>(1, 61) : 1;
   for (std::size_t length = 0; length < rootEnd; length += step) {
     const Outcome outcome = TryToken(xml.substr(0, length));
     ASSERT_EQ("XMLParseException", outcome.exceptionClass) << length << " octets: " << outcome;

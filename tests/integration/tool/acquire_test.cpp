@@ -9,8 +9,9 @@
 #include <gtest/gtest.h>
 
 #include <ctime>
+#include <filesystem>
 #include <iomanip>
-#include <regex>
+#include <set>
 #include <sstream>
 #include <string>
 
@@ -18,6 +19,7 @@ namespace ToolTest {
 namespace {
 
 using testing::HasSubstr;
+using testing::MatchesRegex;
 using testing::Not;
 using testing::StartsWith;
 
@@ -289,7 +291,7 @@ TEST_F(Acquire, ShowsTheLibrarysLogAndNoSecretInIt) {
   for (const std::string &pattern : expected) {
     std::string line;
     std::getline(lines, line);
-    EXPECT_TRUE(std::regex_match(line, std::regex(pattern))) << line;
+    EXPECT_THAT(line, MatchesRegex(pattern));
   }
   EXPECT_EQ(std::istringstream::traits_type::eof(), lines.peek());
   EXPECT_THAT(result.err, Not(HasSubstr("wonderland")));
@@ -388,10 +390,8 @@ TEST_F(Acquire, RefusesAnAnswerThatIsCutShort) {
   const Result result = Run("ssoclient acquire " + Service("truncate") + PASSWORD + "--out token.xml");
   EXPECT_EQ(4, result.exitCode);
   EXPECT_EQ("", result.out);
-  EXPECT_TRUE(std::regex_match(result.err,
-                               std::regex("ssoclient: communication failed: Bad response from localhost:[0-9]+: the "
-                                          "connection ended after [0-9]+ of the body's [0-9]+ bytes\n")))
-      << result.err;
+  EXPECT_THAT(result.err, MatchesRegex("ssoclient: communication failed: Bad response from localhost:[0-9]+: the "
+                                       "connection ended after [0-9]+ of the body's [0-9]+ bytes\n"));
   EXPECT_EQ(0u, m_folder.Names().count("token.xml"));
 }
 
@@ -399,10 +399,8 @@ TEST_F(Acquire, RefusesATokenThatIsNotSigned) {
   const Result result = Run("ssoclient acquire " + Service("unsigned-token") + PASSWORD + "--out token.xml");
   EXPECT_EQ(8, result.exitCode);
   EXPECT_EQ("", result.out);
-  EXPECT_TRUE(std::regex_match(result.err,
-                               std::regex("ssoclient: service fault: Signature syntax error: Expected ds:Signature, "
-                                          "found \"saml:Subject\" at line 1, column [0-9]+\n")))
-      << result.err;
+  EXPECT_THAT(result.err, MatchesRegex("ssoclient: service fault: Signature syntax error: Expected ds:Signature, "
+                                       "found \"saml:Subject\" at line 1, column [0-9]+\n"));
   EXPECT_EQ(0u, m_folder.Names().count("token.xml"));
 }
 

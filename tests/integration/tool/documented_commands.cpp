@@ -1,14 +1,15 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "documented_commands.h"
 
+#include "built_files.h"
 #include "terminal.h"
+#include "token_values.h"
 
 #include <gtest/gtest.h>
 
 #include <filesystem>
 #include <fstream>
 #include <iterator>
-#include <regex>
 #include <sstream>
 
 namespace ToolTest {
@@ -34,15 +35,15 @@ std::vector<std::string> JoinContinued(const std::vector<std::string> &lines) {
   return joined;
 }
 
-/// The lines of `text` from behind the one that matches `begin` to before the next one that matches `end`, over and over.
-std::vector<std::string> LinesBetween(const std::string &text, const std::regex &begin, const std::regex &end) {
+/// The lines of `text` from behind the line `begin` to before the next line `end`, over and over.
+std::vector<std::string> LinesBetween(const std::string &text, const std::string &begin, const std::string &end) {
   std::vector<std::string> lines;
   std::istringstream stream(text);
   bool isInside = false;
   for (std::string line; std::getline(stream, line);) {
     if (!isInside) {
-      isInside = std::regex_match(line, begin);
-    } else if (std::regex_match(line, end)) {
+      isInside = line == begin;
+    } else if (line == end) {
       isInside = false;
     } else {
       lines.push_back(line);
@@ -51,20 +52,26 @@ std::vector<std::string> LinesBetween(const std::string &text, const std::regex 
   return lines;
 }
 
+/// `text` with each URL that begins with `start`, up to the next white space, replaced by `url`.
+std::string ReplaceUrls(std::string text, const std::string &start, const std::string &url) {
+  for (std::size_t at = text.find(start); at != std::string::npos; at = text.find(start, at + url.size())) {
+    text.replace(at, text.find_first_of(" \t\n", at) - at, url);
+  }
+  return text;
+}
+
 } // namespace
 
 std::vector<std::string> ExamplesOfHelp(const std::string &command) {
   const std::string help = RunTool({command, "--help"}).out;
-  return JoinContinued(LinesBetween(help, std::regex("Examples:"), std::regex("")));
+  return JoinContinued(LinesBetween(help, "Examples:", ""));
 }
 
 std::vector<std::string> ExamplesOfManual() {
   std::vector<std::string> lines;
-  for (const std::string &line :
-       LinesBetween(ReadText(PROJECT_FOLDER "/docs/man/ssoclient.1"), std::regex("\\.RS"), std::regex("\\.RE"))) {
+  for (const std::string &line : LinesBetween(ReadText(ProjectPath("docs/man/ssoclient.1")), ".RS", ".RE")) {
     if (line.front() != '.') {
-      lines.push_back(
-          std::regex_replace(std::regex_replace(line, std::regex("\\\\-"), "-"), std::regex("\\\\e"), "\\"));
+      lines.push_back(Fill(Fill(line, "\\-", "-"), "\\e", "\\"));
     }
   }
   return JoinContinued(lines);
@@ -72,8 +79,7 @@ std::vector<std::string> ExamplesOfManual() {
 
 std::vector<std::string> ExamplesOfPage(const std::string &page) {
   std::vector<std::string> examples;
-  for (const std::string &line :
-       JoinContinued(LinesBetween(ReadText(PROJECT_FOLDER "/" + page), std::regex("```sh"), std::regex("```")))) {
+  for (const std::string &line : JoinContinued(LinesBetween(ReadText(ProjectPath(page)), "```sh", "```"))) {
     if (line.find("ssoclient ") == 0) {
       examples.push_back(line);
     }
@@ -92,9 +98,9 @@ DocumentedCommands::DocumentedCommands(const std::vector<std::string> &serviceAr
 }
 
 void DocumentedCommands::ExpectToRun(const std::string &example) const {
-  std::string line =
-      std::regex_replace(example, std::regex("https://(sts\\.corp\\.example|localhost:8443)/\\S*"), m_service.GetUrl());
-  line = std::regex_replace(line, std::regex("HTTP/sts\\.corp\\.example@"), "HTTP/localhost@");
+  std::string line = ReplaceUrls(example, "https://sts.corp.example/", m_service.GetUrl());
+  line = ReplaceUrls(line, "https://localhost:8443/", m_service.GetUrl());
+  line = Fill(line, "HTTP/sts.corp.example@", "HTTP/localhost@");
   const bool asks = line.find("--user") != std::string::npos && line.find("--password-") == std::string::npos;
   if (asks) {
     TerminalSession session(ShellCommand(line), m_folder.Path());

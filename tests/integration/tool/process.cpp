@@ -1,6 +1,8 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "process.h"
 
+#include "built_files.h"
+
 #include <array>
 #include <cerrno>
 #include <csignal>
@@ -139,26 +141,26 @@ bool Catches(pid_t id, int signal) {
 } // namespace
 
 void HeedSignals() {
-  for (const int signal : {SIGINT, SIGQUIT, SIGPIPE}) {
+  for (const int signal : {SIGINT, SIGQUIT, SIGPIPE, SIGHUP, SIGTERM}) {
     std::signal(signal, SIG_DFL);
   }
 }
 
 std::vector<std::string> ToolCommand(const std::vector<std::string> &arguments) {
-  std::vector<std::string> all = {SSOCLIENT_TOOL};
+  std::vector<std::string> all = {ToolPath()};
   all.insert(all.end(), arguments.begin(), arguments.end());
   return all;
 }
 
 std::vector<std::string> ShellCommand(const std::string &commandLine) {
-  const std::string toolFolder = std::filesystem::path(SSOCLIENT_TOOL).parent_path();
+  const std::string toolFolder = std::filesystem::path(ToolPath()).parent_path();
   return {"/bin/sh", "-c", "PATH='" + toolFolder + "':\"$PATH\"; " + commandLine};
 }
 
 Result RunTool(const std::vector<std::string> &arguments, const std::string &input) {
   Process process;
   Result result;
-  Start(process, ToolCommand(arguments), TEST_DATA_DIR "/tokens");
+  Start(process, ToolCommand(arguments), Testing::DataPath("tokens"));
   Exchange(process, input, result);
   Finish(process, result);
   return result;
@@ -176,7 +178,7 @@ Result RunShell(const std::string &commandLine, const std::string &folder) {
 Result RunToolAndSignal(const std::vector<std::string> &arguments, int signal) {
   Process process;
   Result result;
-  Start(process, ToolCommand(arguments), TEST_DATA_DIR "/tokens");
+  Start(process, ToolCommand(arguments), Testing::DataPath("tokens"));
   // No event tells from outside that a process has come to catch a signal, so its state is asked for.
   while (!Catches(process.id, signal)) {
     if (waitpid(process.id, nullptr, WNOHANG) != 0) {

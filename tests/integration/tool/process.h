@@ -4,6 +4,8 @@
 
 #pragma once
 
+#include "support/data_file.h"
+
 #include <string>
 #include <vector>
 
@@ -29,7 +31,7 @@ std::vector<std::string> ShellCommand(const std::string &commandLine);
 Result RunTool(const std::vector<std::string> &arguments, const std::string &input = {});
 
 /// Runs `commandLine` by the shell, in `folder`, as `ShellCommand` says.
-Result RunShell(const std::string &commandLine, const std::string &folder = TEST_DATA_DIR "/tokens");
+Result RunShell(const std::string &commandLine, const std::string &folder = Testing::DataPath("tokens"));
 
 /// Starts the tool with a standard input that stays open and silent, sends it `signal` once it catches that signal, and
 /// returns how it ended.

@@ -3,6 +3,7 @@
 
 #include "expect_result.h"
 #include "service_test.h"
+#include "support/data_file.h"
 #include "token_values.h"
 
 #include <gmock/gmock.h>
@@ -102,7 +103,7 @@ TEST_F(Validate, SaysThatATokenIsValid) {
 
 TEST_F(Validate, SaysThatATokenIsNotValid) {
   // Trusted here, but none of the service's tokens.
-  const std::string tokens = TEST_DATA_DIR "/tokens/";
+  const std::string tokens = Testing::DataPath("tokens/");
   const std::string foreign = "--trust " + tokens + "sts-rsa.crt " + tokens + "bearer.xml";
   ExpectResult(Run("ssoclient validate " + Service() + foreign), 5, "invalid\n", "");
   ExpectResult(Run("ssoclient validate --format json " + Service() + foreign), 5, "{\"schema\":1,\"valid\":false}\n",
@@ -110,7 +111,7 @@ TEST_F(Validate, SaysThatATokenIsNotValid) {
 }
 
 TEST_F(Validate, AsksAboutATokenThatHasExpiredWhenTheToleranceAllowsIt) {
-  const std::string tokens = TEST_DATA_DIR "/tokens/";
+  const std::string tokens = Testing::DataPath("tokens/");
   ExpectResult(Run("ssoclient validate " + Service() + "--tolerance 3000000000 --trust " + tokens + "sts-rsa.crt " +
                    tokens + "expired.xml"),
                5, "invalid\n", "");

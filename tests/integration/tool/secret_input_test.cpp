@@ -5,6 +5,7 @@
 #include "closed_port.h"
 #include "expect_result.h"
 #include "process.h"
+#include "support/data_file.h"
 #include "support/work_folder.h"
 #include "terminal.h"
 
@@ -19,14 +20,14 @@ namespace {
 
 using Testing::WorkFolder;
 
-constexpr const char *TOKENS = TEST_DATA_DIR "/tokens";
-constexpr const char *KEYS = TEST_DATA_DIR "/crypto";
+const std::string TOKENS = Testing::DataPath("tokens");
+const std::string KEYS = Testing::DataPath("crypto");
 
 class SecretInput : public testing::Test {
 protected:
   SecretInput() {
     m_acquire = {"acquire",      "--sts",   "http://" + m_port.HostAndPort(),
-                 "--allow-http", "--trust", std::string(TOKENS) + "/sts-rsa.crt"};
+                 "--allow-http", "--trust", TOKENS + "/sts-rsa.crt"};
   }
 
   std::vector<std::string> Acquire(const std::vector<std::string> &more) const {
@@ -66,14 +67,12 @@ TEST_F(SecretInput, AsksAtTheTerminalWithoutEcho) {
 }
 
 TEST_F(SecretInput, AsksAtTheTerminalAlsoWhenStandardInputIsAnotherFile) {
-  TerminalSession session(
-      Acquire({"--key", KEYS + std::string("/rsa2048-encrypted.key"), "--cert", KEYS + std::string("/rsa2048.crt")}),
-      TOKENS);
+  TerminalSession session(Acquire({"--key", KEYS + "/rsa2048-encrypted.key", "--cert", KEYS + "/rsa2048.crt"}), TOKENS);
   session.WaitFor("/rsa2048-encrypted.key: ");
   EXPECT_FALSE(session.Echoes());
   session.Type("open sesame\n");
   EXPECT_EQ(4, session.Finish());
-  EXPECT_EQ(0u, session.Shown().find("Passphrase for " + std::string(KEYS) + "/rsa2048-encrypted.key: \r\n"));
+  EXPECT_EQ(0u, session.Shown().find("Passphrase for " + KEYS + "/rsa2048-encrypted.key: \r\n"));
 }
 
 TEST_F(SecretInput, MakesTheTerminalQuietAlsoWhenItIsNamedAsFile) {
@@ -152,9 +151,8 @@ TEST_F(SecretInput, ReadsAPasswordFromAFileAndFromStandardInputAndFromADescripto
 
 TEST_F(SecretInput, ReadsAPassphraseFromAFileAndFromStandardInputAndFromADescriptor) {
   m_folder.Write("passphrase", "open sesame\nand no further line\n");
-  const std::string keys = KEYS;
-  for (const std::string &key : {"--cert " + keys + "/rsa2048.crt --key " + keys + "/rsa2048-encrypted.key ",
-                                 "--p12 " + keys + "/rsa2048.p12 "}) {
+  for (const std::string &key : {"--cert " + KEYS + "/rsa2048.crt --key " + KEYS + "/rsa2048-encrypted.key ",
+                                 "--p12 " + KEYS + "/rsa2048.p12 "}) {
     for (const char *source : {"--passphrase-file passphrase", "--passphrase-file - <passphrase",
                                "--passphrase-fd 0 <passphrase", "--passphrase-fd 7 7<passphrase"}) {
       ExpectResult(RunShell(ShellLine(key) + source, m_folder.Path()), 4, "", Unreachable());

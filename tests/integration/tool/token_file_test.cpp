@@ -1,6 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 // The file that a token is written to: whole or not at all, for its owner alone.
 
+#include "built_files.h"
 #include "expect_result.h"
 #include "service_test.h"
 #include "terminal.h"
@@ -65,11 +66,17 @@ TEST_F(TokenFile, IsReplacedByForceAndThenForItsOwnerAlone) {
 }
 
 TEST_F(TokenFile, ThatComesMeanwhileIsNotReplacedWithoutForce) {
-  TerminalSession session(ShellCommand("exec " + Line("stall-then-answer-10")), m_folder.Path());
-  AwaitLog("/sts/fault/stall-then-answer-10: issued");
+  TerminalSession session(
+      ShellCommand("exec ssoclient acquire " + Service() + "--user alice@corp.example --format xml --out token.xml"),
+      m_folder.Path());
+  session.WaitFor("Password for alice@corp.example: "); // by then the tool has seen that there is no such file
   m_folder.Write("token.xml", "what came meanwhile");
+  session.Type("wonderland\n");
   EXPECT_EQ(7, session.Finish());
-  EXPECT_EQ("ssoclient: file: token.xml: is there already; --force replaces it\r\n", session.Shown());
+  EXPECT_EQ("Password for alice@corp.example: \r\n"
+            "ssoclient: file: token.xml: is there already; --force replaces it\r\n",
+            session.Shown());
+  EXPECT_NE(std::string::npos, m_service.GetLog().find(": issued")) << m_service.GetLog();
   EXPECT_EQ("what came meanwhile", m_folder.Read("token.xml"));
   EXPECT_EQ(WithToken(), m_folder.Names());
 }
@@ -88,9 +95,9 @@ TEST_F(TokenFile, StaysAsItWasWhenItCannotBeReplacedWhole) {
 
 TEST_F(TokenFile, IsWrittenWholeWhenTheToolIsToldToEndMeanwhile) {
   for (const int signal : {SIGINT, SIGTERM, SIGHUP}) {
-    const Result result =
-        Run("SIGNAL_AT_FSYNC=" + std::to_string(signal) +
-            " ASAN_OPTIONS=verify_asan_link_order=0 LD_PRELOAD=" INTERRUPTING_FSYNC " exec " + Line() + "--force");
+    const Result result = Run("SIGNAL_AT_FSYNC=" + std::to_string(signal) +
+                              " ASAN_OPTIONS=verify_asan_link_order=0 LD_PRELOAD=" + InterruptingFsyncPath() +
+                              " exec " + Line() + "--force");
     EXPECT_EQ(128 + signal, result.exitCode) << result.err;
     EXPECT_EQ(WithToken(), m_folder.Names());
     EXPECT_TRUE(IsToken("token.xml"));

@@ -59,7 +59,8 @@ TEST_P(TransportFromAPool, CarriesFiveHundredRequestsWhateverTheCeiling) {
   EXPECT_LE(pool->GetThreadCount(), GetParam());
 }
 
-INSTANTIATE_TEST_SUITE_P(Ceilings, TransportFromAPool, testing::Values(1, 2, 8, 256));
+INSTANTIATE_TEST_SUITE_P(Ceilings, TransportFromAPool, testing::Values(1, 2, 8, 256),
+                         testing::PrintToStringParamName());
 
 TEST(TransportFromALargePool, HasAllRequestsInFlightAtOnceWhereTheCeilingAllows) {
   constexpr int IN_FLIGHT = 256;

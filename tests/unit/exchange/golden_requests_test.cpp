@@ -9,6 +9,8 @@
 #include <gtest/gtest.h>
 
 #include <cstdlib>
+#include <fstream>
+#include <string>
 
 namespace SsoClient {
 namespace {
@@ -25,7 +27,7 @@ TEST_P(GoldenRequest, IsOnTheWireAsItsFileShowsIt) {
   const std::string readable = ToReadable(request.body);
   ASSERT_EQ(ToWire(readable), request.body) << "the readable form does not tell the whole message";
   if (std::getenv("SSOCLIENT_UPDATE_GOLDEN")) {
-    std::ofstream(std::string(TEST_DATA_DIR) + "/" + file, std::ios::binary) << readable;
+    std::ofstream(DataPath(file), std::ios::binary) << readable;
     FAIL() << "wrote " << file;
   }
   const std::string golden = ReadDataFile(file);

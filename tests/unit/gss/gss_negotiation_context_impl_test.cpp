@@ -1,9 +1,12 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "gss/gss_negotiation_context_impl.h"
 
+#include "support/data_file.h"
 #include "support/recorded_log.h"
 #include "support/service_stand_ins.h"
 #include "support/throws_message.h"
+
+#include <ssoclient/exceptions.h>
 
 #include <gtest/gtest.h>
 

@@ -8,6 +8,7 @@
 #include "support/throws_message.h"
 
 #include <ssoclient/create_saml_token.h>
+#include <ssoclient/exceptions.h>
 #include <tarvel/core/string_util.h>
 
 #include <gtest/gtest.h>

@@ -5,6 +5,8 @@
 #include "support/service_stand_ins.h"
 #include "support/throws_message.h"
 
+#include <ssoclient/exceptions.h>
+
 #include <gtest/gtest.h>
 
 #include <memory>

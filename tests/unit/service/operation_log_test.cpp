@@ -7,6 +7,8 @@
 #include "support/service_stand_ins.h"
 #include "support/throws_message.h"
 
+#include <ssoclient/exceptions.h>
+
 #include <gtest/gtest.h>
 
 #include <algorithm>

@@ -2,9 +2,11 @@
 #include "service/security_token_service_impl.h"
 
 #include "support/counting_token.h"
+#include "support/data_file.h"
 #include "support/service_stand_ins.h"
 #include "support/throws_message.h"
 
+#include <ssoclient/exceptions.h>
 #include <tarvel/xml/parser.h>
 
 #include <gtest/gtest.h>

@@ -6,6 +6,7 @@
 #include "support/identity.h"
 #include "support/operations_in_turn.h"
 #include "support/process_resources.h"
+#include "support/repetitions.h"
 #include "support/service_stand_ins.h"
 #include "support/soap_responses.h"
 
@@ -94,8 +95,6 @@ TEST(OneServiceOnSixteenThreads, RunsTwentyThousandOperationsWithoutErrorOrGrowt
 }
 
 TEST(OneServiceOnSixteenThreads, ComposesReadsAndVerifiesTwentyThousandTimesWithoutErrorOrGrowth) {
-  // Under a sanitizer a tenth of them, which takes as long as all do elsewhere.
-  constexpr int OPERATIONS = Testing::IS_SANITIZED ? 2000 : 20000;
   const std::string tokenXml = Testing::ReadDataFile("tokens/bearer.xml");
   const std::string issued = Testing::IssueResponse(tokenXml);
   const std::string renewed = Testing::RenewResponse(tokenXml);
@@ -108,7 +107,7 @@ TEST(OneServiceOnSixteenThreads, ComposesReadsAndVerifiesTwentyThousandTimesWith
                                          Testing::TrustedCertificates());
   const auto held = CreateSamlToken(Testing::ReadDataFile("tokens/holder-of-key.xml"), Testing::TrustedCertificates());
   OperationsInTurn operations(service, "alice", *held);
-  ExpectNoErrorAndNoGrowth(OPERATIONS, operations, *transport);
+  ExpectNoErrorAndNoGrowth(Testing::Repetitions(20000, 2000), operations, *transport);
 }
 
 } // namespace

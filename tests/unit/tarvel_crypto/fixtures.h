@@ -4,12 +4,13 @@
 
 #pragma once
 
+#include "support/data_file.h"
+
 #include <tarvel/crypto/certificate.h>
 #include <tarvel/crypto/private_key.h>
 
-#include <fstream>
-#include <iterator>
-#include <stdexcept>
+#include <algorithm>
+#include <cstdint>
 #include <string>
 
 namespace Testing {
@@ -17,15 +18,18 @@ namespace Testing {
 inline const std::string PASSPHRASE = "open sesame";
 
 inline std::string FixturePath(const std::string &name) {
-  return TEST_DATA_DIR "/crypto/" + name;
+  return DataPath("crypto/" + name);
 }
 
 inline std::string ReadFixture(const std::string &name) {
-  std::ifstream file(FixturePath(name), std::ios::binary);
-  if (!file) {
-    throw std::runtime_error("no fixture " + name);
-  }
-  return {std::istreambuf_iterator<char>(file), {}};
+  return ReadDataFile("crypto/" + name);
+}
+
+/// The name of a fixture in the form that names of test cases have.
+inline std::string TestName(std::string fixture) {
+  std::replace_if(
+      fixture.begin(), fixture.end(), [](char c) { return c == '-' || c == '.'; }, '_');
+  return fixture;
 }
 
 inline Tarvel::Ref<const Tarvel::Crypto::Certificate> FixtureCertificate(const std::string &name) {

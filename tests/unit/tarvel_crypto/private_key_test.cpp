@@ -119,7 +119,8 @@ INSTANTIATE_TEST_SUITE_P(
         KeyForm{"p256.key.der", "p256", false}, KeyForm{"p256-traditional.key", "p256", false},
         KeyForm{"p256-traditional.key.der", "p256", false}, KeyForm{"p256-traditional-encrypted.key", "p256", true},
         KeyForm{"p256-encrypted.key", "p256", true}, KeyForm{"p256-encrypted.key.der", "p256", true},
-        KeyForm{"certificate-then-key.pem", "rsa2048", false}));
+        KeyForm{"certificate-then-key.pem", "rsa2048", false}),
+    [](const auto &form) { return Testing::TestName(form.param.file); });
 
 TEST(PrivateKey, TellsItsAlgorithmAndSize) {
   EXPECT_EQ(FixtureKey("rsa3072")->GetAlgorithm(), "RSA");

@@ -152,7 +152,8 @@ INSTANTIATE_TEST_SUITE_P(All, SignatureValues,
                                            SignedFixture{"p384", ECDSA, SHA512, "p384-ecdsa-sha512.raw"},
                                            SignedFixture{"p521", ECDSA, SHA256, "p521-ecdsa-sha256.raw"},
                                            SignedFixture{"p521", ECDSA, SHA384, "p521-ecdsa-sha384.raw"},
-                                           SignedFixture{"p521", ECDSA, SHA512, "p521-ecdsa-sha512.raw"}));
+                                           SignedFixture{"p521", ECDSA, SHA512, "p521-ecdsa-sha512.raw"}),
+                         [](const auto &fixture) { return Testing::TestName(fixture.param.file); });
 
 TEST(VerifyDigest, RefusesPssWithAnotherSaltLengthOrMaskDigest) {
   const auto certificate = FixtureCertificate("rsa2048");

@@ -4,6 +4,8 @@
 
 #pragma once
 
+#include "support/data_file.h"
+
 #include <tarvel/core/ref.h>
 #include <tarvel/crypto/certificate.h>
 #include <tarvel/io/reader.h>
@@ -13,8 +15,6 @@
 #include <tarvel/xml/security/canonicalizer.h>
 #include <tarvel/xml/security/signature.h>
 
-#include <fstream>
-#include <iterator>
 #include <set>
 #include <stdexcept>
 #include <string>
@@ -62,14 +62,6 @@ inline const Tarvel::Xml::ElementNode &FindElement(const Tarvel::Xml::Document &
   throw std::logic_error("no element " + std::string(localName));
 }
 
-inline std::string ReadFixture(const std::string &name) {
-  std::ifstream file(std::string(TEST_DATA_DIR) + "/" + name, std::ios::binary);
-  if (!file) {
-    throw std::runtime_error("no fixture " + name);
-  }
-  return std::string(std::istreambuf_iterator<char>(file), {});
-}
-
 /// `text` with `from`, which must stand in it, replaced once.
 inline std::string Replaced(std::string text, std::string_view from, std::string_view to) {
   const std::size_t at = text.find(from);
@@ -82,7 +74,7 @@ inline std::string Replaced(std::string text, std::string_view from, std::string
 inline Tarvel::Crypto::CertificateList Trusted(const std::vector<std::string> &names) {
   Tarvel::Crypto::CertificateList certificates;
   for (const std::string &name : names) {
-    certificates.push_back(Tarvel::Crypto::CreateCertificateFromPem(ReadFixture("tokens/" + name + ".crt")));
+    certificates.push_back(Tarvel::Crypto::CreateCertificateFromPem(ReadDataFile("tokens/" + name + ".crt")));
   }
   return certificates;
 }

@@ -1,6 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 
 #include "documents.h"
+#include "support/data_file.h"
 #include "support/throws_message.h"
 
 #include <tarvel/core/exception.h>
@@ -32,7 +33,7 @@ constexpr std::string_view MESSAGE = "<e:Envelope xmlns:e='urn:e'><e:Header ID='
                                      "<e:Body ID='b' xmlns:x='urn:x'><x:y>two</x:y></e:Body></e:Envelope>";
 
 Ref<const PrivateKey> Key(const std::string &name) {
-  return Tarvel::Crypto::CreatePrivateKey(Testing::ReadFixture("tokens/" + name + ".key"));
+  return Tarvel::Crypto::CreatePrivateKey(Testing::ReadDataFile("tokens/" + name + ".key"));
 }
 
 Ref<Signature> BlankSignatureOf(Document &document, std::string_view algorithm = Uri::RSA_SHA256,

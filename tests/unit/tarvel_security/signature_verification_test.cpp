@@ -1,6 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 
 #include "documents.h"
+#include "support/data_file.h"
 #include "support/throws_message.h"
 
 #include <tarvel/core/exception.h>
@@ -9,7 +10,9 @@
 
 #include <gtest/gtest.h>
 
+#include <algorithm>
 #include <ostream>
+#include <string>
 
 namespace {
 
@@ -18,7 +21,7 @@ using Tarvel::Xml::Security::CreateTrustSetKeyResolver;
 using Tarvel::Xml::Security::XmlSecurityException;
 using Testing::FindElement;
 using Testing::ParseDocument;
-using Testing::ReadFixture;
+using Testing::ReadDataFile;
 using Testing::Replaced;
 using Testing::SignatureOf;
 using Testing::Trusted;
@@ -62,7 +65,7 @@ constexpr SignedFixture SIGNED_FIXTURES[] = {
 
 class VerifyFixture : public ::testing::TestWithParam<SignedFixture> {
 protected:
-  std::string Text() const { return ReadFixture(std::string("tokens/") + GetParam().name + ".xml"); }
+  std::string Text() const { return ReadDataFile(std::string("tokens/") + GetParam().name + ".xml"); }
 };
 
 TEST_P(VerifyFixture, AcceptsWhatOthersSigned) {
@@ -85,12 +88,16 @@ TEST_P(VerifyFixture, FindsTheKeyAmongAllTrustedOnes) {
       VerifyText(Text(), {"other", "sts-rsa-2", "sts-ec521", "sts-ec384", "sts-ec256", "sts-rsa3072", "sts-rsa"}));
 }
 
-INSTANTIATE_TEST_SUITE_P(Verify, VerifyFixture, ::testing::ValuesIn(SIGNED_FIXTURES));
+INSTANTIATE_TEST_SUITE_P(Verify, VerifyFixture, ::testing::ValuesIn(SIGNED_FIXTURES), [](const auto &fixture) {
+  std::string name = fixture.param.name;
+  std::replace(name.begin(), name.end(), '-', '_');
+  return name;
+});
 
 const std::string EXCLUSIVE_TRANSFORM = R"(<ds:Transform Algorithm="http://www.w3.org/2001/10/xml-exc-c14n#"/>)";
 
 std::string GoodToken() {
-  return ReadFixture("tokens/rsa-sha256.xml");
+  return ReadDataFile("tokens/rsa-sha256.xml");
 }
 
 std::string IdOf(const std::string &token) {
@@ -135,7 +142,7 @@ TEST(Verify, AnswersTheSameEachTime) {
 
 TEST(Verify, AnswersFalseWhenNoTrustedKeyMadeTheSignature) {
   EXPECT_FALSE(VerifyText(GoodToken(), {"other", "sts-rsa-2"}));
-  EXPECT_FALSE(VerifyText(ReadFixture("tokens/signed-by-other.xml")));
+  EXPECT_FALSE(VerifyText(ReadDataFile("tokens/signed-by-other.xml")));
 }
 
 TEST(Verify, AcceptsAnotherCertificateOfATrustedKeyAndOneThatHasExpired) {
@@ -149,12 +156,12 @@ TEST(Verify, RefusesWhenNoTrustedKeyFitsTheAlgorithm) {
                         refusal + std::string(Uri::RSA_SHA256) + "\"");
   EXPECT_THROWS_MESSAGE(VerifyText(GoodToken(), {"sts-ec256"}), XmlSecurityException,
                         refusal + std::string(Uri::RSA_SHA256) + "\"");
-  EXPECT_THROWS_MESSAGE(VerifyText(ReadFixture("tokens/ecdsa-p256-sha256.xml"), {"sts-rsa"}), XmlSecurityException,
+  EXPECT_THROWS_MESSAGE(VerifyText(ReadDataFile("tokens/ecdsa-p256-sha256.xml"), {"sts-rsa"}), XmlSecurityException,
                         refusal + std::string(Uri::ECDSA_SHA256) + "\"");
 }
 
 TEST(Verify, RefusesAnRsaKeyOfLessThan2048Bits) {
-  EXPECT_THROWS_MESSAGE(VerifyText(ReadFixture("tokens/rsa1024.xml"), {"sts-rsa1024"}), XmlSecurityException,
+  EXPECT_THROWS_MESSAGE(VerifyText(ReadDataFile("tokens/rsa1024.xml"), {"sts-rsa1024"}), XmlSecurityException,
                         "No trusted key can be used with the signature algorithm \"" + std::string(Uri::RSA_SHA256) +
                             "\"");
 }
@@ -353,7 +360,7 @@ TEST(Verify, ComparesTheDigestByAllItsBytes) {
 
 TEST(Verify, LeavesCommentsOutOfWhatAReferenceCovers) {
   EXPECT_EQ("accepted", Refusal("<saml:Subject>", "<!-- not signed --><saml:Subject>"));
-  std::string text = ReadFixture("tokens/c14n-exclusive-with-comments.xml");
+  std::string text = ReadDataFile("tokens/c14n-exclusive-with-comments.xml");
   EXPECT_EQ("accepted", RefusalOf(Replaced(text, "<saml:Subject>", "<!-- not signed --><saml:Subject>")));
 }
 

@@ -5,6 +5,7 @@
 #pragma once
 
 #include "support/completion.h"
+#include "support/data_file.h"
 #include "support/scripted_server.h"
 
 #include <tarvel/ssl/ssl_context.h>
@@ -15,7 +16,7 @@
 namespace Testing {
 
 inline std::string TlsPath(const std::string &name) {
-  return TEST_DATA_DIR "/tls/" + name;
+  return DataPath("tls/" + name);
 }
 
 inline Tarvel::Ref<const Tarvel::Crypto::Certificate> TlsCertificate(const std::string &name) {

@@ -284,7 +284,7 @@ TEST_P(ThreadPoolCeiling, FiveHundredItemsThatWaitForTheNetworkEnd) {
   EXPECT_LE(pool->GetThreadCount(), GetParam());
 }
 
-INSTANTIATE_TEST_SUITE_P(Ceilings, ThreadPoolCeiling, testing::Values(1, 2, 8, 256));
+INSTANTIATE_TEST_SUITE_P(Ceilings, ThreadPoolCeiling, testing::Values(1, 2, 8, 256), testing::PrintToStringParamName());
 
 } // namespace
 } // namespace System

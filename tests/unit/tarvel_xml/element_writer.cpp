@@ -2,13 +2,12 @@
 
 #include <tarvel/xml/node.h>
 
+#include "support/data_file.h"
 #include "support/xml_tree.h"
 
 #include <gtest/gtest.h>
 
 #include <filesystem>
-#include <fstream>
-#include <sstream>
 #include <string>
 
 namespace Tarvel {
@@ -103,15 +102,12 @@ TEST(WriteTo, CarriesEveryAsciiCharacterThroughAParserUnchanged) {
 
 TEST(WriteTo, GivesTheSameTreeBackForEachToken) {
   std::size_t tokens = 0;
-  for (const auto &entry : std::filesystem::directory_iterator(TEST_DATA_DIR "/tokens")) {
+  for (const auto &entry : std::filesystem::directory_iterator(::Testing::DataPath("tokens"))) {
     if (entry.path().extension() != ".xml") {
       continue;
     }
     SCOPED_TRACE(entry.path());
-    std::ifstream file(entry.path());
-    std::ostringstream content;
-    content << file.rdbuf();
-    const auto document = ParseDocument(content.str());
+    const auto document = ParseDocument(::Testing::ReadDataFile("tokens/" + entry.path().filename().string()));
     const auto again = ParseDocument(WriteElement(*document->GetDocumentElement()));
     EXPECT_TRUE(DescribeTree(*again->GetDocumentElement()) == DescribeTree(*document->GetDocumentElement()));
     ++tokens;

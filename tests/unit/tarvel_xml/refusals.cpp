@@ -2,6 +2,7 @@
 
 #include <tarvel/xml/parser.h>
 
+#include "support/data_file.h"
 #include "support/throws_message.h"
 #include "support/xml_tree.h"
 
@@ -9,9 +10,7 @@
 
 #include <gtest/gtest.h>
 
-#include <fstream>
 #include <memory>
-#include <sstream>
 #include <string>
 
 namespace Tarvel {
@@ -19,6 +18,7 @@ namespace Xml {
 namespace {
 
 using ::Testing::ParseDocument;
+using ::Testing::ReadDataFile;
 using namespace std::string_literals;
 
 struct Refused {
@@ -221,13 +221,6 @@ TEST(ParseDocument, ShortensTheParsersWordsBetweenTwoCharacters) {
   }
 }
 
-std::string ReadFixture(const std::string &name) {
-  std::ifstream file(TEST_DATA_DIR "/tokens/" + name);
-  std::ostringstream content;
-  content << file.rdbuf();
-  return content.str();
-}
-
 TEST(ParseDocument, RefusesEveryPrefixOfADocument) {
   const std::string sample = "\xEF\xBB\xBF<?xml version='1.0' encoding='UTF-8'?>\n<!--c--><p:a xmlns:p='urn:a&amp;b' "
                              "xmlns=\"urn:d\" x='&#x20AC;'>"
@@ -239,7 +232,7 @@ TEST(ParseDocument, RefusesEveryPrefixOfADocument) {
 }
 
 TEST(ParseDocument, RefusesEveryPrefixOfAToken) {
-  const std::string token = ReadFixture("bearer.xml");
+  const std::string token = ReadDataFile("tokens/bearer.xml");
   const std::size_t end = token.rfind('>');
   ASSERT_NE(end, std::string::npos);
   ASSERT_NO_THROW(ParseDocument(token.substr(0, end + 1)));
@@ -249,7 +242,7 @@ TEST(ParseDocument, RefusesEveryPrefixOfAToken) {
 }
 
 TEST(ParseDocument, EndsInATreeOrItsExceptionForEveryChangedByteOfAToken) {
-  std::string token = ReadFixture("bearer.xml");
+  std::string token = ReadDataFile("tokens/bearer.xml");
   ASSERT_FALSE(token.empty());
   std::size_t refused = 0;
   for (std::size_t offset = 0; offset < token.size(); ++offset) {

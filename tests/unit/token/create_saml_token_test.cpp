@@ -35,7 +35,7 @@ std::string Fixture(const std::string &name) {
 }
 
 CertificateList Trusted(const std::string &name = "sts-rsa") {
-  return Tarvel::Crypto::LoadCertificates(std::string(TEST_DATA_DIR) + "/tokens/" + name + ".crt");
+  return Tarvel::Crypto::LoadCertificates(DataPath("tokens/" + name + ".crt"));
 }
 
 /// It is 2026-01-02T03:04:05Z in all of these tests.

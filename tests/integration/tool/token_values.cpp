@@ -1,0 +1,35 @@
+// SPDX-License-Identifier: Apache-2.0
+#include "token_values.h"
+
+#include <stdexcept>
+
+namespace ToolTest {
+
+std::string AttributeIn(const std::string &xml, const std::string &name) {
+  const std::string start = name + "=\"";
+  // Before the name comes a blank, or the colon of its prefix: it must not be the end of a longer name.
+  for (std::size_t at = xml.find(start, 1); at != std::string::npos; at = xml.find(start, at + 1)) {
+    const std::size_t begin = at + start.size();
+    const std::size_t end = xml.find('"', begin);
+    if ((xml[at - 1] == ' ' || xml[at - 1] == ':') && end != std::string::npos) {
+      return xml.substr(begin, end - begin);
+    }
+  }
+  throw std::runtime_error("no attribute " + name + " in " + xml);
+}
+
+std::string Fill(std::string text, const std::string &mark, const std::string &value) {
+  for (std::size_t at = text.find(mark); at != std::string::npos; at = text.find(mark, at + value.size())) {
+    text.replace(at, mark.size(), value);
+  }
+  return text;
+}
+
+std::string FillFrom(const std::string &xml, std::string text) {
+  text = Fill(text, "@ID@", AttributeIn(xml, "ID"));
+  const std::string conditions = xml.substr(xml.find("Conditions "));
+  text = Fill(text, "@NOT_BEFORE@", AttributeIn(conditions, "NotBefore"));
+  return Fill(text, "@NOT_ON_OR_AFTER@", AttributeIn(conditions, "NotOnOrAfter"));
+}
+
+} // namespace ToolTest

@@ -1,0 +1,68 @@
+// SPDX-License-Identifier: Apache-2.0
+
+#include "support/completion.h"
+
+#include "system/io_engine.h"
+
+#include <boost/asio/post.hpp>
+
+namespace Testing {
+
+bool Completion::Wait() const {
+  std::unique_lock<std::mutex> lock(m_state->mutex);
+  return m_state->called.wait_for(lock, PATIENCE, [this] { return m_state->calls > 0; });
+}
+
+int Completion::GetCalls() const {
+  const std::lock_guard<std::mutex> lock(m_state->mutex);
+  return m_state->calls;
+}
+
+std::string Completion::GetMessage() const {
+  if (!Wait()) {
+    return "(never called)";
+  }
+  const std::lock_guard<std::mutex> lock(m_state->mutex);
+  return m_state->failure ? m_state->failure->what() : "";
+}
+
+std::size_t Completion::GetCount() const {
+  Wait();
+  const std::lock_guard<std::mutex> lock(m_state->mutex);
+  return m_state->count;
+}
+
+void Completion::State::Note(std::size_t moved, const Tarvel::Exception *exception) {
+  const std::lock_guard<std::mutex> lock(mutex);
+  ++calls;
+  count = moved;
+  failure.reset(exception ? exception->Clone() : nullptr);
+  called.notify_all();
+}
+
+bool Completion::FailedWith(const std::type_info &expected) const {
+  Wait();
+  const std::lock_guard<std::mutex> lock(m_state->mutex);
+  const Tarvel::Exception *const failure = m_state->failure.get();
+  return failure && typeid(*failure) == expected;
+}
+
+bool DrainIoThreads() {
+  struct Meeting {
+    std::mutex mutex;
+    std::condition_variable changed;
+    int present = 0;
+  };
+  const auto meeting = std::make_shared<Meeting>();
+  const auto attend = [meeting] {
+    std::unique_lock<std::mutex> lock(meeting->mutex);
+    ++meeting->present;
+    meeting->changed.notify_all();
+    return meeting->changed.wait_for(lock, PATIENCE, [&meeting] { return meeting->present == 3; });
+  };
+  boost::asio::post(Tarvel::System::GetIoContext(), attend);
+  boost::asio::post(Tarvel::System::GetIoContext(), attend);
+  return attend();
+}
+
+} // namespace Testing
