@@ -29,13 +29,27 @@ if(SSOCLIENT_SANITIZERS)
   endif()
 endif()
 
-# The fuzzing engine steers by the coverage of all our code, not only of the fuzz targets.
-if(SSOCLIENT_FUZZ_ENGINE)
-  if(NOT CMAKE_CXX_COMPILER_ID MATCHES "Clang")
-    message(FATAL_ERROR "SSOCLIENT_FUZZ_ENGINE needs clang")
-  endif()
-  add_compile_options(-fsanitize=fuzzer-no-link)
+if(SSOCLIENT_FUZZ_ENGINE AND NOT CMAKE_CXX_COMPILER_ID MATCHES "Clang")
+  message(FATAL_ERROR "SSOCLIENT_FUZZ_ENGINE needs clang")
 endif()
+# The fuzzing engine steers by the coverage of the libraries' code, not only by that of the fuzz targets.
+function(ssoclient_guide_fuzzing target)
+  if(SSOCLIENT_FUZZ_ENGINE)
+    target_compile_options(${target} PRIVATE -fsanitize=fuzzer-no-link)
+  endif()
+endfunction()
+
+# Programs that are linked often and shipped never are linked by the fastest linker there is.
+option(SSOCLIENT_FAST_LINKER "Link tests and fuzz targets by mold when it is installed" ${PROJECT_IS_TOP_LEVEL})
+if(SSOCLIENT_FAST_LINKER)
+  find_program(SSOCLIENT_MOLD mold)
+  mark_as_advanced(SSOCLIENT_MOLD)
+endif()
+function(ssoclient_link_fast target)
+  if(SSOCLIENT_FAST_LINKER AND SSOCLIENT_MOLD)
+    target_link_options(${target} INTERFACE -fuse-ld=mold)
+  endif()
+endfunction()
 
 # Threads of the library outlive each use of it: a program that closes a plug-in which uses it must not pull the code away
 # from under them.

@@ -1,0 +1,41 @@
+# SPDX-License-Identifier: Apache-2.0
+# shellcheck shell=bash
+# For scripts to source: runs steps, remembers how long each took and how it ended, and shows both as a table.
+
+step_rows=()
+failed_steps=()
+
+# run_step NAME COMMAND…: runs the command in a shell of its own, in which the first command that fails ends it. Succeeds
+# whatever becomes of it; failed_steps has the names of those that failed.
+run_step() {
+  local name="$1" started=$SECONDS result=passed status
+  shift
+  set +e
+  (set -e; "$@")
+  status=$?
+  set -e
+  if [[ $status -ne 0 ]]; then
+    result=FAILED
+    failed_steps+=("$name")
+  fi
+  step_rows+=("$(printf '%-10s %-7s %4d s' "$name" "$result" "$((SECONDS - started))")")
+}
+
+# show_steps TITLE: the table, with the sum of all steps at its end.
+show_steps() {
+  echo "=== $1"
+  printf '  %s\n' "${step_rows[@]}"
+  printf '  %-10s %-7s %4d s\n' total '' "$SECONDS"
+}
+
+# show_slowest COUNT FILE…: the slowest of the tests in JUnit files that ctest wrote, with the build they ran in.
+show_slowest() {
+  local count="$1" file
+  shift
+  for file in "$@"; do
+    sed -nE 's/.*<testcase name="([^"]*)".* time="([0-9.]+)".*/\2 \1/p' "$file" |
+      sed "s|\$| ($(basename "$(dirname "$file")"))|"
+  done | sort -rn | head -n "$count" | while read -r seconds name; do
+    printf '  %7.1f s  %s\n' "$seconds" "$name"
+  done
+}
