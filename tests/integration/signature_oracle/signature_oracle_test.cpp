@@ -33,7 +33,7 @@ using Tarvel::Xml::Security::KeyInfoResolver;
 using Tarvel::Xml::Security::Signature;
 using Testing::RandomSource;
 
-const std::size_t DOCUMENTS = Testing::Repetitions<std::size_t>(10000, 2000); // for each algorithm
+const std::size_t DOCUMENTS = Testing::Repetitions<std::size_t>(10000, 1000); // for each algorithm
 constexpr std::size_t CHANGES = 4; // signing is dear: so many documents come from one signature
 
 const std::string KEYS = Testing::DataPath("tokens/");
