@@ -5,8 +5,8 @@
 step_rows=()
 failed_steps=()
 
-# run_step NAME COMMAND…: runs the command in a shell of its own, in which the first command that fails ends it. Succeeds
-# whatever becomes of it; failed_steps has the names of those that failed.
+# run_step NAME COMMAND…: runs the command in a shell of its own, in which the first command that fails ends it. Always
+# succeeds; failed_steps has the names of those that failed.
 run_step() {
   local name="$1" started=$SECONDS result=passed status
   shift
