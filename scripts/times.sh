@@ -35,7 +35,7 @@ show_slowest() {
   for file in "$@"; do
     sed -nE 's/.*<testcase name="([^"]*)".* time="([0-9.]+)".*/\2 \1/p' "$file" |
       sed "s|\$| ($(basename "$(dirname "$file")"))|"
-  done | sort -rn | head -n "$count" | while read -r seconds name; do
+  done | sort -rn | sed -n "1,${count}p" | while read -r seconds name; do
     printf '  %7.1f s  %s\n' "$seconds" "$name"
   done
 }
