@@ -8,7 +8,7 @@
 
 namespace ToolTest {
 
-/// The value of the first attribute `name` in `xml`. @throws std::runtime_error when there is none.
+/// The value of the first attribute `name` in `xml`. @throws std::runtime_error when it has no such attribute.
 std::string AttributeIn(const std::string &xml, const std::string &name);
 
 /// `text` with each `mark` replaced by `value`.
