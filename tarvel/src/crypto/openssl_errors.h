@@ -4,12 +4,14 @@
 
 #pragma once
 
+#include "system/fork_gate.h"
+
 #include <string>
 
 namespace Tarvel::Crypto {
 
 /// Around calls of OpenSSL. What they put on the calling thread's error queue is gone when the scope ends; what was
-/// there before stays.
+/// there before stays. Nobody forks meanwhile.
 class OpenSslErrorScope {
 public:
   OpenSslErrorScope() noexcept;
@@ -31,6 +33,7 @@ public:
   std::string Describe(const std::string &message) const;
 
 private:
+  const System::Computation m_computing;
   const char *m_newestOfHost = nullptr; // an entry's own copy of a file name, and so its identity; null for none
 };
 

@@ -3,7 +3,7 @@
 #include "crypto/openssl_use.h"
 
 #include "crypto/openssl_errors.h"
-#include "crypto/thread_lane.h"
+#include "system/thread_lane.h"
 
 #include <tarvel/crypto/certificate.h>
 
@@ -23,13 +23,12 @@ namespace Tarvel::Crypto {
 
 namespace {
 
-/// A use is computation alone, so this is far more than one takes. A child process that was forked during a use of its
-/// parent's waits for all of it, for nobody there will end that use.
+/// A use is computation alone, so this is far more than one takes.
 constexpr std::chrono::milliseconds MAX_WAIT{500};
 constexpr std::chrono::microseconds WAIT_STEP{100};
 
 /// The uses that are going on, counted by the lanes of the threads: one count for all would be what they queue up for.
-struct alignas(LANE_ALIGNMENT) Lane {
+struct alignas(System::LANE_ALIGNMENT) Lane {
   std::atomic<std::uint32_t> uses{0};
 };
 
@@ -46,7 +45,7 @@ std::atomic<Abandoned *> abandoned{nullptr};
 
 /// Where the use is counted that has begun; null when none may begin any more.
 std::atomic<std::uint32_t> *TryBegin() noexcept {
-  std::atomic<std::uint32_t> &uses = lanes[GetThreadLane(lanes.size())].uses;
+  std::atomic<std::uint32_t> &uses = lanes[System::GetThreadLane(lanes.size())].uses;
   uses.fetch_add(1);
   if (ended.load()) {
     uses.fetch_sub(1);

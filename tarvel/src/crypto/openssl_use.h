@@ -4,6 +4,8 @@
 
 #pragma once
 
+#include "system/fork_gate.h"
+
 #include <atomic>
 #include <cstdint>
 
@@ -11,6 +13,7 @@ namespace Tarvel::Crypto {
 
 /// Around short uses of OpenSSL on a thread that nobody joins. OpenSSL's clean-up, which runs when the process ends or the
 /// host asks for it, waits a moment for the uses that are going on; later ones are told to keep away.
+/// Nobody forks during a use.
 class OpenSslUse {
 public:
   OpenSslUse() noexcept;
@@ -33,6 +36,7 @@ public:
   static void Abandon(void *object) noexcept;
 
 private:
+  const System::Computation m_computing;
   std::atomic<std::uint32_t> *const m_count; // of the lane in which it began; null when it is not allowed
 };
 

@@ -2,6 +2,8 @@
 
 #include "crypto/passphrase.h"
 
+#include "system/fork_gate.h"
+
 #include <tarvel/core/secure_wipe.h>
 
 namespace Tarvel::Crypto {
@@ -16,7 +18,10 @@ const std::string &Passphrase::Get() {
   }
   if (!m_asked) {
     m_asked = true;
-    std::string answer = m_ask();
+    std::string answer = [this] {
+      const System::HostCall call;
+      return m_ask();
+    }();
     m_text.assign(answer);
     SecureWipe(answer); // a short text is not moved but copied: what is left of the answer is a secret too
   }

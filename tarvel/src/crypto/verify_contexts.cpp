@@ -15,7 +15,7 @@ VerifyContexts::~VerifyContexts() {
 std::atomic<EVP_PKEY_CTX *> &VerifyContexts::GetSlot(std::size_t lane, SignatureScheme scheme,
                                                      DigestAlgorithm algorithm) noexcept {
   const std::size_t kind = static_cast<std::size_t>(scheme) * ALGORITHMS + static_cast<std::size_t>(algorithm);
-  return m_lanes[(GetThreadLane(LANES) + lane) % LANES].contexts[kind];
+  return m_lanes[(System::GetThreadLane(LANES) + lane) % LANES].contexts[kind];
 }
 
 KeyContextHandle VerifyContexts::Take(SignatureScheme scheme, DigestAlgorithm algorithm) noexcept {

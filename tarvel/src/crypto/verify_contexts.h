@@ -6,7 +6,7 @@
 
 #include "crypto/openssl_handles.h"
 #include "crypto/public_key.h"
-#include "crypto/thread_lane.h"
+#include "system/thread_lane.h"
 
 #include <array>
 #include <atomic>
@@ -34,7 +34,7 @@ private:
   static constexpr std::size_t ALGORITHMS = 3;
   static constexpr std::size_t LANES = 4; // threads beyond these that use one certificate at once set up their own
 
-  struct alignas(LANE_ALIGNMENT) Lane {
+  struct alignas(System::LANE_ALIGNMENT) Lane {
     std::array<std::atomic<EVP_PKEY_CTX *>, SCHEMES * ALGORITHMS> contexts{};
   };
 

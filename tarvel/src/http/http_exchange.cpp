@@ -9,6 +9,7 @@
 #include <tarvel/ssl/ssl_context.h>
 
 #include <algorithm>
+#include <mutex>
 #include <utility>
 
 namespace Tarvel::Http {
@@ -64,7 +65,7 @@ void HttpExchange::Start() {
       [self](const Ref<System::Stream> &stream, const Exception *failure) { self->OnConnected(stream, failure); });
   bool isCancelled = false;
   {
-    const std::lock_guard<std::mutex> lock(m_mutex);
+    const std::lock_guard<System::ForkSafeMutex> lock(m_mutex);
     if (m_isFinishing || m_stream) {
       return; // connected, or failed, already
     }
@@ -79,7 +80,7 @@ void HttpExchange::Start() {
 void HttpExchange::OnConnected(const Ref<System::Stream> &stream, const Exception *failure) {
   bool isCancelled = false;
   {
-    const std::lock_guard<std::mutex> lock(m_mutex);
+    const std::lock_guard<System::ForkSafeMutex> lock(m_mutex);
     m_connecting.reset();
     m_stream = stream;
     isCancelled = m_isCancelled;
@@ -116,7 +117,7 @@ void HttpExchange::OnWritten(const Exception *failure) {
   std::shared_ptr<const Exception> writeFailure(failure ? failure->Clone() : nullptr);
   bool endWaits = false;
   {
-    const std::lock_guard<std::mutex> lock(m_mutex);
+    const std::lock_guard<System::ForkSafeMutex> lock(m_mutex);
     m_isWriteOver = true;
     m_writeFailure = std::move(writeFailure);
     endWaits = m_endWaitsForWrite;
@@ -149,7 +150,7 @@ void HttpExchange::OnRead(std::size_t count, const Exception *failure) {
   }
   Ref<System::Stream> stream;
   {
-    const std::lock_guard<std::mutex> lock(m_mutex);
+    const std::lock_guard<System::ForkSafeMutex> lock(m_mutex);
     stream = m_stream;
   }
   if (stream) {
@@ -161,7 +162,7 @@ void HttpExchange::OnRead(std::size_t count, const Exception *failure) {
 /// a body ends by it, only when the write went well.
 void HttpExchange::OnEnd() {
   {
-    const std::lock_guard<std::mutex> lock(m_mutex);
+    const std::lock_guard<System::ForkSafeMutex> lock(m_mutex);
     if (!m_isWriteOver && m_reader.EndsWithConnection()) {
       m_endWaitsForWrite = true;
       return;
@@ -173,7 +174,7 @@ void HttpExchange::OnEnd() {
 void HttpExchange::FinishEnd() {
   std::shared_ptr<const Exception> writeFailure;
   {
-    const std::lock_guard<std::mutex> lock(m_mutex);
+    const std::lock_guard<System::ForkSafeMutex> lock(m_mutex);
     writeFailure = m_writeFailure;
   }
   if (writeFailure) {
@@ -222,7 +223,7 @@ void HttpExchange::Finish(const Exception *failure, const Ref<ClientResponse> &r
   UserAgent::CompletionFunction completion;
   std::shared_ptr<const Exception> outcome(failure ? failure->Clone() : nullptr);
   {
-    const std::lock_guard<std::mutex> lock(m_mutex);
+    const std::lock_guard<System::ForkSafeMutex> lock(m_mutex);
     if (std::exchange(m_isFinishing, true)) {
       return;
     }
@@ -238,7 +239,7 @@ void HttpExchange::Finish(const Exception *failure, const Ref<ClientResponse> &r
   Complete(completion, outcome.get(), response);
   completion = nullptr; // what it holds is gone before anybody who waits goes on
   {
-    const std::lock_guard<std::mutex> lock(m_mutex);
+    const std::lock_guard<System::ForkSafeMutex> lock(m_mutex);
     m_failure = outcome;
     m_response = response;
     m_isDone = true;
@@ -251,6 +252,7 @@ void HttpExchange::Complete(const UserAgent::CompletionFunction &completion, con
   if (!completion) {
     return;
   }
+  const System::HostCall call;
   try {
     completion(failure, response, Ref<PendingRequestItem>(this));
   } catch (...) {
@@ -261,7 +263,11 @@ void HttpExchange::Complete(const UserAgent::CompletionFunction &completion, con
 Ref<ClientResponse> HttpExchange::Wait(std::chrono::microseconds timeout) {
   timeout = std::clamp(timeout, std::chrono::microseconds(0), MAX_TIMEOUT);
   const auto deadline = std::chrono::steady_clock::now() + timeout;
-  std::unique_lock<std::mutex> lock(m_mutex);
+  std::unique_lock<System::ForkSafeMutex> lock(m_mutex);
+  if (!m_isDone && IsOfParent()) {
+    throw System::NetworkException("The request to " + m_endpoint +
+                                   " was under way when the process forked: its parent goes on with it");
+  }
   if (!m_done.wait_until(lock, deadline, [this] { return m_isDone; })) {
     lock.unlock();
     Cancel();
@@ -277,8 +283,8 @@ void HttpExchange::Cancel() noexcept {
   Ref<System::ScheduledItem> connecting;
   Ref<System::Stream> stream;
   {
-    const std::lock_guard<std::mutex> lock(m_mutex);
-    if (m_isFinishing) {
+    const std::lock_guard<System::ForkSafeMutex> lock(m_mutex);
+    if (m_isFinishing || IsOfParent()) {
       return;
     }
     m_isCancelled = true;
@@ -294,8 +300,8 @@ void HttpExchange::Cancel() noexcept {
 }
 
 bool HttpExchange::IsDone() const noexcept {
-  const std::lock_guard<std::mutex> lock(m_mutex);
-  return m_isDone;
+  const std::lock_guard<System::ForkSafeMutex> lock(m_mutex);
+  return m_isDone || IsOfParent();
 }
 
 } // namespace Tarvel::Http

@@ -6,6 +6,7 @@
 
 #include "http/client_request_impl.h"
 #include "http/response_reader.h"
+#include "system/fork_gate.h"
 
 #include <tarvel/http/connection_spec.h>
 #include <tarvel/http/cookie_store.h>
@@ -17,7 +18,6 @@
 #include <cstddef>
 #include <functional>
 #include <memory>
-#include <mutex>
 #include <string>
 
 namespace Tarvel::Http {
@@ -33,9 +33,11 @@ public:
   void Start();
 
   /// Waits, on this thread alone, until the completion function has run.
-  /// @throws System::TimeoutException after cancelling; otherwise what the request failed with.
+  /// @throws System::TimeoutException after cancelling; System::NetworkException at once in a child of the process that
+  ///         started the request, unless the request was done before; otherwise what the request failed with.
   Ref<ClientResponse> Wait(std::chrono::microseconds timeout);
 
+  /// In a child of the process that started it, a request that was under way is over, and there is nothing to cancel.
   void Cancel() noexcept override;
   bool IsDone() const noexcept override;
 
@@ -64,6 +66,10 @@ private:
   void Complete(const UserAgent::CompletionFunction &completion, const Exception *failure,
                 const Ref<ClientResponse> &response) noexcept;
 
+  /// Whether this is the copy of a parent's exchange, of which nothing more will be heard here.
+  bool IsOfParent() const noexcept { return m_generation != System::GetForkGeneration(); }
+
+  const unsigned m_generation = System::GetForkGeneration();
   const Ref<ConnectionSpec> m_spec;
   const Ref<CookieStore> m_cookies;
   const std::string m_endpoint; // for messages
@@ -75,8 +81,9 @@ private:
   ResponseReader m_reader;
   bool m_isSecure = false;
 
-  mutable std::mutex m_mutex; // guards all that follows; never held while a handler or a completion function runs
-  std::condition_variable m_done;
+  mutable System::ForkSafeMutex
+      m_mutex; // guards all that follows; never held while a handler or a completion function runs
+  std::condition_variable_any m_done;
   Ref<System::ScheduledItem> m_connecting;
   Ref<System::Stream> m_stream;
   UserAgent::CompletionFunction m_completion;

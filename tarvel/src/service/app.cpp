@@ -2,6 +2,8 @@
 
 #include <tarvel/service/app.h>
 
+#include "system/fork_gate.h"
+
 #include <memory>
 #include <mutex>
 #include <utility>
@@ -11,12 +13,16 @@ namespace Service {
 
 namespace {
 
+using System::Computation;
+using System::ForkSafeMutex;
+using System::HostCall;
+
 class LogRootImpl final : public LogRoot {
 public:
   void SetSink(LogSink sink) override {
     std::shared_ptr<const LogSink> next = sink ? std::make_shared<const LogSink>(std::move(sink)) : nullptr;
     {
-      const std::lock_guard<std::mutex> lock(m_mutex);
+      const std::lock_guard<ForkSafeMutex> lock(m_mutex);
       m_hasSink.store(next != nullptr, std::memory_order_relaxed);
       m_sink.swap(next);
     }
@@ -29,6 +35,7 @@ public:
     }
     try {
       if (const std::shared_ptr<const LogSink> sink = CurrentSink()) {
+        const HostCall call;
         (*sink)(record);
       }
     } catch (...) {
@@ -40,11 +47,11 @@ public:
 
 private:
   std::shared_ptr<const LogSink> CurrentSink() const {
-    const std::lock_guard<std::mutex> lock(m_mutex);
+    const std::lock_guard<ForkSafeMutex> lock(m_mutex);
     return m_sink;
   }
 
-  mutable std::mutex m_mutex;
+  mutable ForkSafeMutex m_mutex;
   std::shared_ptr<const LogSink> m_sink;
   std::atomic<bool> m_hasSink{false};
 };
@@ -60,6 +67,7 @@ private:
 } // namespace
 
 App &GetApp() {
+  const Computation computing;
   // Never destroyed: a thread may log as long as the process lives, past the end of static objects.
   static AppImpl *const app = new AppImpl;
   return *app;

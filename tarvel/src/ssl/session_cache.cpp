@@ -6,6 +6,7 @@
 
 #include <ctime>
 #include <iterator>
+#include <mutex>
 #include <utility>
 
 namespace Tarvel::Ssl {
@@ -33,7 +34,8 @@ bool IsUsable(const SSL_SESSION *session) {
 } // namespace
 
 void SessionCache::Put(const std::string &key, SessionHandle session) {
-  const std::lock_guard<std::mutex> lock(m_mutex);
+  const std::lock_guard<System::ForkSafeMutex> lock(m_mutex);
+  ForgetThoseOfParent();
   Entries entry;
   entry.push_back(Entry{key, std::move(session)});
   m_byKey.emplace(key, entry.begin());
@@ -50,7 +52,8 @@ void SessionCache::Put(const std::string &key, SessionHandle session) {
 }
 
 SessionHandle SessionCache::Take(const std::string &key) {
-  const std::lock_guard<std::mutex> lock(m_mutex);
+  const std::lock_guard<System::ForkSafeMutex> lock(m_mutex);
+  ForgetThoseOfParent();
   for (auto end = m_byKey.upper_bound(key); end != m_byKey.lower_bound(key); end = m_byKey.upper_bound(key)) {
     const auto newest = std::prev(end);
     SessionHandle session = std::move(newest->second->session);
@@ -64,19 +67,27 @@ SessionHandle SessionCache::Take(const std::string &key) {
 }
 
 void SessionCache::Abandon() noexcept {
-  const std::lock_guard<std::mutex> lock(m_mutex);
+  const std::lock_guard<System::ForkSafeMutex> lock(m_mutex);
   for (Entry &entry : m_entries) {
     Crypto::OpenSslUse::Abandon(entry.session.release());
   }
 }
 
-std::size_t SessionCache::GetSize() const {
-  const std::lock_guard<std::mutex> lock(m_mutex);
+std::size_t SessionCache::GetSize() {
+  const std::lock_guard<System::ForkSafeMutex> lock(m_mutex);
+  ForgetThoseOfParent();
   return m_entries.size();
 }
 
+void SessionCache::ForgetThoseOfParent() {
+  if (std::exchange(m_generation, System::GetForkGeneration()) != System::GetForkGeneration()) {
+    m_byKey.clear();
+    m_entries.clear();
+  }
+}
+
 void SessionCache::Clear() {
-  const std::lock_guard<std::mutex> lock(m_mutex);
+  const std::lock_guard<System::ForkSafeMutex> lock(m_mutex);
   m_byKey.clear();
   m_entries.clear();
 }

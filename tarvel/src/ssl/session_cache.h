@@ -5,11 +5,11 @@
 #pragma once
 
 #include "ssl/ssl_handles.h"
+#include "system/fork_gate.h"
 
 #include <cstddef>
 #include <list>
 #include <map>
-#include <mutex>
 #include <string>
 
 namespace Tarvel::Ssl {
@@ -34,7 +34,7 @@ public:
   /// Forgets the sessions without freeing them, once OpenSSL is gone.
   void Abandon() noexcept;
 
-  std::size_t GetSize() const;
+  std::size_t GetSize();
 
 private:
   struct Entry {
@@ -43,7 +43,11 @@ private:
   };
   using Entries = std::list<Entry>;
 
-  mutable std::mutex m_mutex;                            // guards all that follows
+  /// Under the lock: a child begins with none, for what its parent has is its parent's to use.
+  void ForgetThoseOfParent();
+
+  mutable System::ForkSafeMutex m_mutex;                 // guards all that follows
+  unsigned m_generation = System::GetForkGeneration();   // of the process that the entries belong to
   Entries m_entries;                                     // the oldest first
   std::multimap<std::string, Entries::iterator> m_byKey; // within a key, the oldest first
 };

@@ -15,6 +15,7 @@
 #include <openssl/err.h>
 
 #include <algorithm>
+#include <mutex>
 #include <utility>
 
 namespace Tarvel::Ssl {
@@ -45,6 +46,7 @@ std::string DescribeSubject(X509 *certificate) {
 
 template <typename Handler, typename... Args>
 void CallGuarded(const Handler &handler, const Args &...args) noexcept {
+  const System::HostCall call;
   try {
     handler(args...);
   } catch (...) {
@@ -52,9 +54,16 @@ void CallGuarded(const Handler &handler, const Args &...args) noexcept {
   }
 }
 
-void PostRefusal(System::Stream::TransferHandler handler, const char *reason) {
+constexpr const char *OF_PARENT = "The connection belongs to the process that this one was forked from";
+
+/// Calls `handler` with `arguments` and an `InvalidStateException` for `reason`, on an I/O thread.
+template <typename Handler, typename... Arguments>
+void PostRefusal(Handler handler, const char *reason, Arguments... arguments) {
+  const System::Computation computing;
   boost::asio::post(System::GetIoContext(),
-                    [handler = std::move(handler), failure = InvalidStateException(reason)] { handler(0, &failure); });
+                    [handler = std::move(handler), failure = InvalidStateException(reason), arguments...] {
+                      CallGuarded(handler, arguments..., static_cast<const Exception *>(&failure));
+                    });
 }
 
 } // namespace
@@ -121,12 +130,17 @@ SSLStreamImpl::~SSLStreamImpl() {
 }
 
 void SSLStreamImpl::AsyncHandshake(const std::string &host, const std::string &parameter, HandshakeHandler handler) {
-  const std::lock_guard<std::mutex> lock(m_mutex);
+  if (IsOfParent()) {
+    PostRefusal(std::move(handler), OF_PARENT);
+    return;
+  }
+  const std::lock_guard<System::ForkSafeMutex> lock(m_mutex);
   if (m_stage != Stage::FRESH) {
     auto failure =
         m_failure ? m_failure : std::make_shared<InvalidStateException>("The TLS handshake was started before");
-    boost::asio::post(System::GetIoContext(),
-                      [handler = std::move(handler), failure = std::move(failure)] { handler(failure.get()); });
+    boost::asio::post(System::GetIoContext(), [handler = std::move(handler), failure = std::move(failure)] {
+      CallGuarded(handler, failure.get());
+    });
     return;
   }
   m_stage = Stage::SHAKING;
@@ -137,9 +151,13 @@ void SSLStreamImpl::AsyncHandshake(const std::string &host, const std::string &p
 }
 
 void SSLStreamImpl::AsyncReadSome(char *buffer, std::size_t length, TransferHandler handler) {
-  const std::lock_guard<std::mutex> lock(m_mutex);
+  if (IsOfParent()) {
+    PostRefusal(std::move(handler), OF_PARENT, std::size_t{0});
+    return;
+  }
+  const std::lock_guard<System::ForkSafeMutex> lock(m_mutex);
   if (m_read || length == 0) {
-    PostRefusal(std::move(handler), "Another read is pending, or the read is one of no bytes");
+    PostRefusal(std::move(handler), "Another read is pending, or the read is one of no bytes", std::size_t{0});
     return;
   }
   m_read = PendingRead{buffer, length, std::move(handler)};
@@ -147,9 +165,13 @@ void SSLStreamImpl::AsyncReadSome(char *buffer, std::size_t length, TransferHand
 }
 
 void SSLStreamImpl::AsyncWrite(const char *bytes, std::size_t length, TransferHandler handler) {
-  const std::lock_guard<std::mutex> lock(m_mutex);
+  if (IsOfParent()) {
+    PostRefusal(std::move(handler), OF_PARENT, std::size_t{0});
+    return;
+  }
+  const std::lock_guard<System::ForkSafeMutex> lock(m_mutex);
   if (m_write) {
-    PostRefusal(std::move(handler), "Another write is pending");
+    PostRefusal(std::move(handler), "Another write is pending", std::size_t{0});
     return;
   }
   m_write = PendingWrite{bytes, length, 0, std::move(handler)};
@@ -157,10 +179,15 @@ void SSLStreamImpl::AsyncWrite(const char *bytes, std::size_t length, TransferHa
 }
 
 void SSLStreamImpl::Close() noexcept {
+  if (IsOfParent()) {
+    m_lower->Close();
+    return;
+  }
   try {
+    const System::Computation computing;
     auto done = std::make_shared<Completions>();
     if (const Crypto::OpenSslUse use; use) {
-      const std::lock_guard<std::mutex> lock(m_mutex);
+      const std::lock_guard<System::ForkSafeMutex> lock(m_mutex);
       const Crypto::OpenSslErrorScope errors;
       if (m_stage == Stage::ESTABLISHED && !m_lowerWrites) {
         SSL_shutdown(m_connection.get()); // the notice leaves only if the stream below takes it at once
@@ -188,7 +215,7 @@ void SSLStreamImpl::PostPump() {
 void SSLStreamImpl::PumpOnce() {
   Completions done;
   if (const Crypto::OpenSslUse use; use) {
-    const std::lock_guard<std::mutex> lock(m_mutex);
+    const std::lock_guard<System::ForkSafeMutex> lock(m_mutex);
     Pump(done);
   }
   done.Run();
@@ -338,6 +365,9 @@ void SSLStreamImpl::EndConnection() noexcept {
   m_connection.reset();
   try {
     for (SessionHandle &session : std::exchange(m_newSessions, {})) {
+      if (IsOfParent()) {
+        continue; // freed by its handle: resumed in both processes, it would betray that they are related
+      }
       m_context->GetSessions().Put(m_sessionKey, std::move(session));
     }
   } catch (...) {
@@ -400,11 +430,12 @@ void SSLStreamImpl::StartLowerRead() {
         auto proceed = [self, count, failure = exception ? LowerFailure(exception->what()) : LowerFailure()] {
           Completions done;
           if (const Crypto::OpenSslUse use; use) {
-            const std::lock_guard<std::mutex> lock(self->m_mutex);
+            const std::lock_guard<System::ForkSafeMutex> lock(self->m_mutex);
             self->OnLowerRead(count, failure, done);
           }
           done.Run();
         };
+        const System::Computation computing;
         boost::asio::dispatch(System::GetIoContext(), std::move(proceed));
       });
 }
@@ -442,11 +473,12 @@ void SSLStreamImpl::StartLowerWrite() {
                         auto proceed = [self, failure = exception ? LowerFailure(exception->what()) : LowerFailure()] {
                           Completions done;
                           if (const Crypto::OpenSslUse use; use) {
-                            const std::lock_guard<std::mutex> lock(self->m_mutex);
+                            const std::lock_guard<System::ForkSafeMutex> lock(self->m_mutex);
                             self->OnLowerWritten(failure, done);
                           }
                           done.Run();
                         };
+                        const System::Computation computing;
                         boost::asio::dispatch(System::GetIoContext(), std::move(proceed));
                       });
 }

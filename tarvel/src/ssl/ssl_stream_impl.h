@@ -9,12 +9,12 @@
 #include "ssl/server_identity.h"
 #include "ssl/ssl_context_impl.h"
 #include "ssl/ssl_handles.h"
+#include "system/fork_gate.h"
 
 #include <tarvel/ssl/ssl_context.h>
 
 #include <atomic>
 #include <memory>
-#include <mutex>
 #include <optional>
 #include <string>
 #include <vector>
@@ -66,6 +66,9 @@ private:
   /// What went wrong below; none when nothing did.
   using LowerFailure = std::optional<std::string>;
 
+  /// Whether this is the copy of a parent's stream: the connection is the parent's to use, and so are its handlers.
+  bool IsOfParent() const noexcept { return m_generation != System::GetForkGeneration(); }
+
   void PostPump();
   void PumpOnce();
 
@@ -93,12 +96,13 @@ private:
   void Fail(const std::string &reason, Completions &done);
   void FailPending(const Failure &failure, Completions &done);
 
+  const unsigned m_generation = System::GetForkGeneration();
   const Ref<SSLContextImpl> m_context;
   const Ref<System::Stream> m_lower;
   const std::string m_endpoint;
   std::atomic<bool> m_wasResumed{false};
 
-  std::mutex m_mutex; // guards all that follows; never held while a handler runs
+  System::ForkSafeMutex m_mutex; // guards all that follows; never held while a handler runs
   Stage m_stage = Stage::FRESH;
   Failure m_failure;
   std::string m_host; // as given; the endpoint until then

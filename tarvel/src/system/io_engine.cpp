@@ -3,13 +3,18 @@
 #include "system/io_engine.h"
 
 #include "system/background_thread.h"
+#include "system/fork_gate.h"
 #include "system/uncaught_exception.h"
 
 #include <tarvel/core/exception.h>
 
 #include <boost/asio/executor_work_guard.hpp>
+#include <boost/system/system_error.hpp>
 
+#include <atomic>
 #include <memory>
+#include <mutex>
+#include <new>
 
 namespace Tarvel::System {
 
@@ -18,9 +23,24 @@ namespace {
 /// Two, so that one long handshake does not hold up everybody else.
 constexpr int IO_THREADS = 2;
 
-class IoEngine {
+struct Descriptors {
+  ForkSafeMutex mutex;
+  boost::intrusive::list<ClosesInChild> open; // guarded by mutex
+};
+
+Descriptors &GetDescriptors() {
+  const Computation computing;
+  static Descriptors *const descriptors = new Descriptors; // never destroyed: sockets may outlive static objects
+  return *descriptors;
+}
+
+class IoEngine final : public ForkListener {
 public:
-  IoEngine() {
+  /// @throws boost::system::system_error without a descriptor.
+  IoEngine() = default;
+
+  /// @throws InvalidStateException when not one thread can be started.
+  void Start() {
     StartBackgroundThread("tarvel-io", [this] { Run(); }).detach();
     try {
       for (int started = 1; started < IO_THREADS; ++started) {
@@ -33,28 +53,105 @@ public:
 
   boost::asio::io_context &GetContext() noexcept { return m_context; }
 
+  // The threads leave the context once their handlers have returned. Then no lock of Asio's is held.
+  void BeforeFork() noexcept override { m_context.stop(); }
+  void AtFork() noexcept override { Notify(boost::asio::execution_context::fork_prepare); }
+  void AfterForkInParent() noexcept override {
+    Notify(boost::asio::execution_context::fork_parent);
+    m_context.restart();
+  }
+  void AfterForkInChild() noexcept override;
+
 private:
   void Run() noexcept {
+    const unsigned generation = GetForkGeneration();
     for (;;) {
+      const Computation computing; // waits while somebody forks
+      if (generation != GetForkGeneration()) {
+        return; // a handler forked, and this is the thread's copy in the child
+      }
       try {
         m_context.run();
-        return;
       } catch (...) {
         LogUncaughtException("a completion handler");
       }
     }
   }
 
+  void Notify(boost::asio::execution_context::fork_event event) noexcept {
+    try {
+      m_context.notify_fork(event);
+    } catch (const boost::system::system_error &) {
+      // A child without a descriptor for a context that it will not use: it misses nothing.
+    }
+  }
+
   boost::asio::io_context m_context{IO_THREADS};
   const boost::asio::executor_work_guard<boost::asio::io_context::executor_type> m_work{m_context.get_executor()};
+  IoEngine *m_ofParent = nullptr; // keeps what the parent's operations hold reachable; never used
 };
+
+std::atomic<IoEngine *> engine{nullptr};
+IoEngine *engineOfParent = nullptr; // of the process that this one was forked from
+
+// Asio closes the child's copies of its own descriptors and makes new ones, so that what is closed afterwards does not
+// reach the parent's. The handlers that are in the context stay there: they belong to the parent.
+void IoEngine::AfterForkInChild() noexcept {
+  Notify(boost::asio::execution_context::fork_child);
+  Descriptors &descriptors = GetDescriptors();
+  while (!descriptors.open.empty()) {
+    ClosesInChild &inherited = descriptors.open.front();
+    descriptors.open.pop_front();
+    inherited.CloseInChild();
+  }
+  m_ofParent = engineOfParent;
+  engineOfParent = this;
+  engine.store(nullptr);
+}
+
+ForkSafeMutex &GetStartMutex() {
+  const Computation computing;
+  static ForkSafeMutex *const mutex = new ForkSafeMutex;
+  return *mutex;
+}
+
+IoEngine &StartEngine() {
+  const std::lock_guard<ForkSafeMutex> lock(GetStartMutex());
+  if (IoEngine *const started = engine.load()) {
+    return *started;
+  }
+  try {
+    auto fresh = std::make_unique<IoEngine>();
+    fresh->Start();
+    SetForkListener(fresh.get());
+    // Never destroyed: its threads run past the end of static objects, and nobody waits for them.
+    engine.store(fresh.get());
+    return *fresh.release();
+  } catch (const boost::system::system_error &error) {
+    throw InvalidStateException(std::string("Cannot start the network: ") + error.code().message());
+  }
+}
 
 } // namespace
 
 boost::asio::io_context &GetIoContext() {
-  // Never destroyed: its threads run past the end of static objects, and nobody waits for them.
-  static IoEngine *const engine = new IoEngine;
-  return engine->GetContext();
+  IoEngine *const started = engine.load(std::memory_order_acquire);
+  return (started ? *started : StartEngine()).GetContext();
+}
+
+void ClosesInChild::Enter() {
+  Descriptors &descriptors = GetDescriptors();
+  const std::lock_guard<ForkSafeMutex> lock(descriptors.mutex);
+  descriptors.open.push_back(*this);
+}
+
+void ClosesInChild::Leave() noexcept {
+  if (!is_linked()) {
+    return; // closed in this child
+  }
+  Descriptors &descriptors = GetDescriptors();
+  const std::lock_guard<ForkSafeMutex> lock(descriptors.mutex);
+  descriptors.open.erase(descriptors.open.iterator_to(*this));
 }
 
 } // namespace Tarvel::System

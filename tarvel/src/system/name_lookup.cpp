@@ -2,6 +2,8 @@
 
 #include "system/name_lookup.h"
 
+#include "system/fork_gate.h"
+
 #include <tarvel/system/stream.h>
 
 #include <cerrno>
@@ -25,24 +27,25 @@ struct AddressInfoDeleter {
 };
 
 struct Replacement {
-  std::mutex mutex;
+  ForkSafeMutex mutex;
   NameLookup lookup; // guarded by mutex; empty for the system's resolver
 };
 
 Replacement &GetReplacement() {
+  const Computation computing;
   static Replacement *const replacement = new Replacement; // never destroyed: lookups may outlive static objects
   return *replacement;
 }
 
 NameLookup Exchange(NameLookup lookup) {
   Replacement &replacement = GetReplacement();
-  const std::lock_guard<std::mutex> lock(replacement.mutex);
+  const std::lock_guard<ForkSafeMutex> lock(replacement.mutex);
   return std::exchange(replacement.lookup, std::move(lookup));
 }
 
 NameLookup CurrentReplacement() {
   Replacement &replacement = GetReplacement();
-  const std::lock_guard<std::mutex> lock(replacement.mutex);
+  const std::lock_guard<ForkSafeMutex> lock(replacement.mutex);
   return replacement.lookup;
 }
 

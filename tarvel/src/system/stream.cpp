@@ -2,6 +2,7 @@
 
 #include <tarvel/system/stream.h>
 
+#include "system/fork_gate.h"
 #include "system/tcp_client_socket.h"
 
 #include <atomic>
@@ -39,6 +40,7 @@ Stream::~Stream() = default;
 TcpClientSocket::~TcpClientSocket() = default;
 
 Ref<TcpClientSocket> CreateTcpClientSocket() {
+  const Computation computing;
   return MakeRef<TcpClientSocketImpl>();
 }
 

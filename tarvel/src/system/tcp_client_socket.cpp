@@ -13,6 +13,7 @@
 #include <boost/asio/post.hpp>
 
 #include <cerrno>
+#include <mutex>
 #include <sys/socket.h>
 #include <unistd.h>
 #include <utility>
@@ -32,6 +33,7 @@ constexpr std::size_t MAX_LOOKUP_THREADS = 64;
 constexpr std::chrono::milliseconds LOOKUP_IDLE_TIME{500};
 
 ThreadPool &LookupPool() {
+  const Computation computing;
   // Never destroyed, as nobody can end a lookup.
   static ThreadPool *const pool = CreateEndlessThreadPool(MAX_LOOKUP_THREADS, LOOKUP_IDLE_TIME).Detach();
   return *pool;
@@ -62,12 +64,20 @@ std::string WithoutBrackets(const std::string &host) {
 
 template <typename Failure>
 void PostTransferFailure(Stream::TransferHandler handler, Failure failure) {
-  asio::post(GetIoContext(), [handler = std::move(handler), failure = std::move(failure)] { handler(0, &failure); });
+  const Computation computing;
+  asio::post(GetIoContext(), [handler = std::move(handler), failure = std::move(failure)] {
+    const HostCall call;
+    handler(0, &failure);
+  });
 }
 
 template <typename Failure>
 void PostConnectFailure(TcpClientSocket::ConnectHandler handler, Failure failure) {
-  asio::post(GetIoContext(), [handler = std::move(handler), failure = std::move(failure)] { handler(&failure); });
+  const Computation computing;
+  asio::post(GetIoContext(), [handler = std::move(handler), failure = std::move(failure)] {
+    const HostCall call;
+    handler(&failure);
+  });
 }
 
 } // namespace
@@ -79,10 +89,27 @@ struct TcpClientSocketImpl::PendingWrite {
   TransferHandler handler;
 };
 
-TcpClientSocketImpl::TcpClientSocketImpl() : m_socket(GetIoContext()), m_attemptTimer(GetIoContext()) {}
+TcpClientSocketImpl::TcpClientSocketImpl() : m_socket(GetIoContext()), m_attemptTimer(GetIoContext()) {
+  Enter();
+}
+
+TcpClientSocketImpl::~TcpClientSocketImpl() {
+  const Computation computing;
+  Leave();
+  error_code ignored; // the descriptor is gone in any case
+  m_socket.close(ignored);
+  m_attemptTimer.cancel(ignored);
+}
+
+void TcpClientSocketImpl::CloseInChild() noexcept {
+  error_code ignored;
+  m_socket.close(ignored);
+  m_stage = Stage::ENDED;
+  m_isOfParent = true;
+}
 
 void TcpClientSocketImpl::AsyncConnect(const std::string &host, int port, ConnectHandler handler) {
-  const std::lock_guard<std::mutex> lock(m_mutex);
+  const std::lock_guard<ForkSafeMutex> lock(m_mutex);
   if (m_stage != Stage::FRESH) {
     PostConnectFailure(std::move(handler), InvalidStateException("The socket has been used or closed already"));
     return;
@@ -122,7 +149,7 @@ void TcpClientSocketImpl::LookUpAndConnect(const std::string &host) {
   } catch (const std::exception &exception) {
     failure = exception.what();
   }
-  const std::lock_guard<std::mutex> lock(m_mutex);
+  const std::lock_guard<ForkSafeMutex> lock(m_mutex);
   if (m_stage != Stage::CONNECTING) {
     return;
   }
@@ -162,7 +189,7 @@ void TcpClientSocketImpl::LimitAttempt() {
   }
   m_attemptTimer.expires_after(MAX_ATTEMPT_TIME);
   m_attemptTimer.async_wait([self = Ref(this), attempt = m_nextAddress](const error_code &cancelled) {
-    const std::lock_guard<std::mutex> lock(self->m_mutex);
+    const std::lock_guard<ForkSafeMutex> lock(self->m_mutex);
     if (!cancelled && self->m_stage == Stage::CONNECTING && self->m_nextAddress == attempt) {
       self->m_isAttemptOverdue = true;
       error_code ignored;
@@ -189,7 +216,7 @@ bool TcpClientSocketImpl::OpenSocket(const tcp::endpoint &endpoint, error_code &
 void TcpClientSocketImpl::OnConnectAttempt(const error_code &error) {
   ConnectHandler handler;
   {
-    const std::lock_guard<std::mutex> lock(m_mutex);
+    const std::lock_guard<ForkSafeMutex> lock(m_mutex);
     if (m_stage != Stage::CONNECTING) {
       return; // closed meanwhile, and the handler told so
     }
@@ -205,6 +232,7 @@ void TcpClientSocketImpl::OnConnectAttempt(const error_code &error) {
     handler = std::move(m_connectHandler);
     m_connectHandler = nullptr;
   }
+  const HostCall call;
   handler(nullptr);
 }
 
@@ -225,7 +253,7 @@ void TcpClientSocketImpl::GiveUpConnect(const std::string &reason) {
 }
 
 bool TcpClientSocketImpl::IsConnectDone() const noexcept {
-  const std::lock_guard<std::mutex> lock(m_mutex);
+  const std::lock_guard<ForkSafeMutex> lock(m_mutex);
   return m_stage == Stage::CONNECTED || m_stage == Stage::ENDED;
 }
 
@@ -233,7 +261,10 @@ void TcpClientSocketImpl::Close() noexcept {
   ConnectHandler handler;
   Ref<ScheduledItem> lookup;
   {
-    const std::lock_guard<std::mutex> lock(m_mutex);
+    const std::lock_guard<ForkSafeMutex> lock(m_mutex);
+    if (m_isOfParent) {
+      return;
+    }
     m_stage = Stage::ENDED;
     error_code ignored; // the descriptor is gone in any case
     m_socket.close(ignored);
@@ -255,7 +286,7 @@ void TcpClientSocketImpl::Close() noexcept {
 }
 
 void TcpClientSocketImpl::AsyncReadSome(char *buffer, std::size_t length, TransferHandler handler) {
-  const std::lock_guard<std::mutex> lock(m_mutex);
+  const std::lock_guard<ForkSafeMutex> lock(m_mutex);
   if (m_stage != Stage::CONNECTED) {
     PostTransferFailure(std::move(handler), DescribeTransferFailure(asio::error::not_connected));
     return;
@@ -277,7 +308,7 @@ void TcpClientSocketImpl::AsyncReadSome(char *buffer, std::size_t length, Transf
 
 void TcpClientSocketImpl::OnRead(const TransferHandler &handler, const error_code &error, std::size_t count) {
   if (error) {
-    const std::lock_guard<std::mutex> lock(m_mutex);
+    const std::lock_guard<ForkSafeMutex> lock(m_mutex);
     m_readEnd = error;
   }
   CompleteRead(handler, error, count);
@@ -286,15 +317,17 @@ void TcpClientSocketImpl::OnRead(const TransferHandler &handler, const error_cod
 void TcpClientSocketImpl::CompleteRead(const TransferHandler &handler, const error_code &error,
                                        std::size_t count) const {
   if (!error || error == asio::error::eof) {
+    const HostCall call;
     handler(count, nullptr);
     return;
   }
   const NetworkException failure = DescribeTransferFailure(error);
+  const HostCall call;
   handler(0, &failure);
 }
 
 void TcpClientSocketImpl::AsyncWrite(const char *bytes, std::size_t length, TransferHandler handler) {
-  const std::lock_guard<std::mutex> lock(m_mutex);
+  const std::lock_guard<ForkSafeMutex> lock(m_mutex);
   if (m_stage != Stage::CONNECTED) {
     PostTransferFailure(std::move(handler), DescribeTransferFailure(asio::error::not_connected));
     return;
@@ -319,7 +352,7 @@ void TcpClientSocketImpl::OnWritten(std::unique_ptr<PendingWrite> pending, const
   pending->written += count;
   error_code result = error;
   {
-    const std::lock_guard<std::mutex> lock(m_mutex);
+    const std::lock_guard<ForkSafeMutex> lock(m_mutex);
     if (!result && pending->written < pending->length) {
       if (m_stage == Stage::CONNECTED) {
         WriteSome(std::move(pending));
@@ -330,10 +363,12 @@ void TcpClientSocketImpl::OnWritten(std::unique_ptr<PendingWrite> pending, const
     m_writeEnd = result;
   }
   if (!result) {
+    const HostCall call;
     pending->handler(pending->written, nullptr);
     return;
   }
   const NetworkException failure = DescribeTransferFailure(result);
+  const HostCall call;
   pending->handler(pending->written, &failure);
 }
 

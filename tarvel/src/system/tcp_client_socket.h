@@ -4,6 +4,8 @@
 
 #pragma once
 
+#include "system/fork_gate.h"
+#include "system/io_engine.h"
 #include "system/name_lookup.h"
 
 #include <tarvel/system/stream.h>
@@ -13,7 +15,6 @@
 
 #include <chrono>
 #include <memory>
-#include <mutex>
 #include <string>
 #include <string_view>
 
@@ -23,8 +24,9 @@ namespace Tarvel::System {
 /// two repetitions of a lost packet.
 constexpr std::chrono::seconds MAX_ATTEMPT_TIME{5};
 
-class TcpClientSocketImpl final : public TcpClientSocket {
+class TcpClientSocketImpl final : public TcpClientSocket, private ClosesInChild {
 public:
+  /// Within a computation.
   TcpClientSocketImpl();
 
   void AsyncConnect(const std::string &host, int port, ConnectHandler handler) override;
@@ -38,7 +40,9 @@ public:
 private:
   enum class Stage { FRESH, CONNECTING, CONNECTED, ENDED };
 
-  ~TcpClientSocketImpl() override = default;
+  ~TcpClientSocketImpl() override;
+
+  void CloseInChild() noexcept override;
 
   // Of the connect. Those that begin with "Try" or "Give" are called under the lock.
   void LookUpAndConnect(const std::string &host);
@@ -58,10 +62,11 @@ private:
 
   NetworkException DescribeTransferFailure(const boost::system::error_code &error) const;
 
-  mutable std::mutex m_mutex; // guards all that follows; never held while a handler runs
+  mutable ForkSafeMutex m_mutex; // guards all that follows; never held while a handler runs
   boost::asio::ip::tcp::socket m_socket;
   Stage m_stage = Stage::FRESH;
-  std::string m_target; // "host:port", for messages; set once
+  bool m_isOfParent = false; // so that nobody is to be called
+  std::string m_target;      // "host:port", for messages; set once
   int m_port = 0;
 
   // How reading and writing ended: Asio may wait for ever when it is asked again.

@@ -4,6 +4,7 @@
 
 #include "system/background_thread.h"
 #include "system/endless_thread_pool.h"
+#include "system/fork_gate.h"
 #include "system/uncaught_exception.h"
 
 #include <tarvel/core/exception.h>
@@ -29,17 +30,41 @@ constexpr std::chrono::milliseconds MAX_IDLE_TIME = std::chrono::hours(24 * 365)
 class WorkItem;
 using WorkQueue = std::list<Ref<WorkItem>>;
 
+/// Threads of a parent process. Here they can be neither joined nor let go, so nobody destroys them.
+void KeepThreadsOfParent(std::list<std::thread> &threads) {
+  struct Kept {
+    ForkSafeMutex mutex;
+    std::list<std::thread> threads; // guarded by mutex
+  };
+  const Computation computing;
+  static Kept *const kept = new Kept;
+  const std::lock_guard<ForkSafeMutex> lock(kept->mutex);
+  kept->threads.splice(kept->threads.end(), threads);
+}
+
 /// What the pool object, its threads and its items share; it lives as long as the last of them.
 struct PoolState {
   PoolState(std::size_t threadCeiling, std::chrono::milliseconds threadIdleTime, bool isEndlessPool)
       : ceiling(threadCeiling), idleTime(std::min(threadIdleTime, MAX_IDLE_TIME)), isEndless(isEndlessPool) {}
+  PoolState(const PoolState &) = delete;
+  PoolState &operator=(const PoolState &) = delete;
+  ~PoolState() {
+    if (IsOfParent()) {
+      KeepThreadsOfParent(threads);
+      KeepThreadsOfParent(retired);
+    }
+  }
 
+  /// Whether this is the copy of a parent's state, and so without the threads that it counts.
+  bool IsOfParent() const noexcept { return generation != GetForkGeneration(); }
+
+  const unsigned generation = GetForkGeneration();
   const std::size_t ceiling;
   const std::chrono::milliseconds idleTime;
   const bool isEndless;
 
-  std::mutex mutex; // guards all that follows
-  std::condition_variable changed;
+  ForkSafeMutex mutex; // guards all that follows
+  std::condition_variable_any changed;
   WorkQueue queue;
   std::list<std::thread> threads;
   std::list<std::thread> retired; // ended, or about to: joined by the next to retire, or with the pool
@@ -59,7 +84,7 @@ public:
     const Ref<WorkItem> self(this); // the queue's reference may be the last
     std::function<void()> work;     // destroyed outside the lock: it may hold anything
     {
-      const std::lock_guard<std::mutex> lock(m_pool->mutex);
+      const std::lock_guard<ForkSafeMutex> lock(m_pool->mutex);
       if (m_stage != Stage::QUEUED) {
         return;
       }
@@ -69,7 +94,8 @@ public:
     }
   }
 
-  bool IsDone() const noexcept override { return m_stage == Stage::DONE; }
+  /// A child never runs what its parent has queued.
+  bool IsDone() const noexcept override { return m_stage == Stage::DONE || m_pool->IsOfParent(); }
 
   /// Called under the pool's lock.
   void PutIntoQueue() { m_place = m_pool->queue.insert(m_pool->queue.end(), Ref<WorkItem>(this)); }
@@ -99,7 +125,7 @@ private:
 };
 
 /// The next item to run; null when the thread has been idle for long enough, or the pool has ended.
-Ref<WorkItem> WaitForWork(PoolState &pool, std::unique_lock<std::mutex> &lock) {
+Ref<WorkItem> WaitForWork(PoolState &pool, std::unique_lock<ForkSafeMutex> &lock) {
   ++pool.idle;
   pool.changed.wait_for(lock, pool.idleTime, [&pool] { return pool.ended || !pool.queue.empty(); });
   --pool.idle;
@@ -112,7 +138,7 @@ Ref<WorkItem> WaitForWork(PoolState &pool, std::unique_lock<std::mutex> &lock) {
 }
 
 /// Takes the calling thread off the pool's list, and joins those that retired before it.
-void Retire(PoolState &pool, std::list<std::thread>::iterator self, std::unique_lock<std::mutex> &lock) {
+void Retire(PoolState &pool, std::list<std::thread>::iterator self, std::unique_lock<ForkSafeMutex> &lock) {
   std::list<std::thread> earlier;
   if (pool.isEndless) {
     self->detach();
@@ -129,11 +155,14 @@ void Retire(PoolState &pool, std::list<std::thread>::iterator self, std::unique_
 
 void RunThread(const std::shared_ptr<PoolState> &pool, std::list<std::thread>::iterator self) {
   currentPool = pool.get();
-  std::unique_lock<std::mutex> lock(pool->mutex);
+  std::unique_lock<ForkSafeMutex> lock(pool->mutex);
   while (Ref<WorkItem> item = WaitForWork(*pool, lock)) {
     lock.unlock();
     item->Run();
     item.reset();
+    if (pool->IsOfParent()) {
+      return; // the item forked, and this is the thread's copy in the child
+    }
     lock.lock();
   }
   if (!pool->ended) {
@@ -152,42 +181,50 @@ void AddThread(const std::shared_ptr<PoolState> &pool) {
   }
 }
 
+/// The first item that is queued; null when there is none.
+Ref<WorkItem> GetFirstQueued(PoolState &pool) {
+  const std::lock_guard<ForkSafeMutex> lock(pool.mutex);
+  return pool.queue.empty() ? Ref<WorkItem>() : pool.queue.front();
+}
+
+void CancelQueued(PoolState &pool) {
+  while (const Ref<WorkItem> item = GetFirstQueued(pool)) {
+    item->Cancel();
+  }
+}
+
 class ThreadPoolImpl final : public ThreadPool {
 public:
   ThreadPoolImpl(std::size_t threadCeiling, std::chrono::milliseconds idleTime, bool isEndless)
       : m_state(std::make_shared<PoolState>(std::max<std::size_t>(threadCeiling, 1), idleTime, isEndless)) {}
 
   Ref<ScheduledItem> QueueWorkItem(std::function<void()> work) override {
-    const Ref<WorkItem> item = MakeRef<WorkItem>(m_state, std::move(work));
-    const std::lock_guard<std::mutex> lock(m_state->mutex);
+    const std::shared_ptr<PoolState> state = GetState();
+    const Ref<WorkItem> item = MakeRef<WorkItem>(state, std::move(work));
+    const std::lock_guard<ForkSafeMutex> lock(state->mutex);
     item->PutIntoQueue();
-    if (m_state->queue.size() > m_state->idle && m_state->threads.size() < m_state->ceiling) {
-      StartThreadFor(*item);
+    if (state->queue.size() > state->idle && state->threads.size() < state->ceiling) {
+      StartThreadFor(*item, state);
     }
-    m_state->changed.notify_one();
+    state->changed.notify_one();
     return item;
   }
 
-  std::size_t GetThreadCeiling() const noexcept override { return m_state->ceiling; }
+  std::size_t GetThreadCeiling() const noexcept override {
+    const std::lock_guard<ForkSafeMutex> lock(m_mutex);
+    return m_state->ceiling;
+  }
 
   std::size_t GetThreadCount() const noexcept override {
-    const std::lock_guard<std::mutex> lock(m_state->mutex);
-    return m_state->threads.size();
+    const std::lock_guard<ForkSafeMutex> lock(m_mutex);
+    const std::lock_guard<ForkSafeMutex> stateLock(m_state->mutex);
+    return m_state->IsOfParent() ? 0 : m_state->threads.size();
   }
 
 private:
   ~ThreadPoolImpl() override {
-    std::list<std::thread> threads;
-    {
-      const std::lock_guard<std::mutex> lock(m_state->mutex);
-      m_state->ended = true;
-      threads.splice(threads.end(), m_state->threads);
-      threads.splice(threads.end(), m_state->retired);
-    }
-    m_state->changed.notify_all();
-    while (const Ref<WorkItem> item = GetFirstQueued()) {
-      item->Cancel();
-    }
+    std::list<std::thread> threads = m_state->IsOfParent() ? std::list<std::thread>() : EndThreads();
+    CancelQueued(*m_state);
     for (std::thread &thread : threads) {
       // A thread of the pool cannot wait for itself, nor for another that may be waiting for it.
       if (currentPool == m_state.get()) {
@@ -198,24 +235,51 @@ private:
     }
   }
 
-  Ref<WorkItem> GetFirstQueued() const noexcept {
-    const std::lock_guard<std::mutex> lock(m_state->mutex);
-    return m_state->queue.empty() ? Ref<WorkItem>() : m_state->queue.front();
+  /// Has the threads end, and hands them to whoever is to wait for them.
+  std::list<std::thread> EndThreads() noexcept {
+    std::list<std::thread> threads;
+    {
+      const std::lock_guard<ForkSafeMutex> lock(m_state->mutex);
+      m_state->ended = true;
+      threads.splice(threads.end(), m_state->threads);
+      threads.splice(threads.end(), m_state->retired);
+    }
+    m_state->changed.notify_all();
+    return threads;
   }
 
-  /// Without any thread the item would wait for ever; with at least one it only waits longer.
-  void StartThreadFor(WorkItem &item) {
+  /// The state of this process's pool. In a child that is a new one, and what its parent had queued is dropped.
+  std::shared_ptr<PoolState> GetState() {
+    std::shared_ptr<PoolState> state;
+    std::shared_ptr<PoolState> ofParent;
+    {
+      const std::lock_guard<ForkSafeMutex> lock(m_mutex);
+      if (m_state->IsOfParent()) {
+        ofParent = std::exchange(m_state,
+                                 std::make_shared<PoolState>(m_state->ceiling, m_state->idleTime, m_state->isEndless));
+      }
+      state = m_state;
+    }
+    if (ofParent) {
+      CancelQueued(*ofParent);
+    }
+    return state;
+  }
+
+  /// Called under the pool's lock. Without any thread the item would wait for ever; with at least one it only waits longer.
+  static void StartThreadFor(WorkItem &item, const std::shared_ptr<PoolState> &state) {
     try {
-      AddThread(m_state);
+      AddThread(state);
     } catch (...) {
-      if (m_state->threads.empty()) {
+      if (state->threads.empty()) {
         item.TakeOutOfQueue();
         throw;
       }
     }
   }
 
-  const std::shared_ptr<PoolState> m_state;
+  mutable ForkSafeMutex m_mutex;
+  std::shared_ptr<PoolState> m_state; // guarded by m_mutex
 };
 
 } // namespace
@@ -223,6 +287,7 @@ private:
 ThreadPool::~ThreadPool() = default;
 
 Ref<ThreadPool> GetThreadPool() {
+  const Computation computing;
   // Never destroyed: its threads run past the end of static objects, and nobody waits for them.
   static ThreadPool *const pool = CreateEndlessThreadPool(DEFAULT_THREAD_CEILING, DEFAULT_IDLE_TIME).Detach();
   return Ref<ThreadPool>(pool);

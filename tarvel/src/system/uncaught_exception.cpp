@@ -3,6 +3,7 @@
 #include "system/uncaught_exception.h"
 
 #include "core/demangle.h"
+#include "system/fork_gate.h"
 
 #include <tarvel/service/app.h>
 #include <tarvel/service/logger.h>
@@ -28,6 +29,7 @@ std::string DescribeCurrentException() {
 }
 
 Service::Logger &PlatformLogger() {
+  const Computation computing;
   // Never destroyed, as the threads that log never end before the process does.
   static Service::Logger *const logger =
       Service::Logger::CreateLogger(Service::GetApp().GetRootLogger(), "Tarvel", LEVEL_WARNING).Detach();

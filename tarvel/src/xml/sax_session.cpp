@@ -2,6 +2,8 @@
 
 #include "xml/sax_session.h"
 
+#include "system/fork_gate.h"
+
 #include <libxml/SAX2.h>
 #include <libxml/parserInternals.h>
 #include <libxml/xmlerror.h>
@@ -197,6 +199,7 @@ SaxSession::SaxSession(std::string_view source, XMLHandler &handler)
 void SaxSession::Run() {
   static std::once_flag initialised;
   std::call_once(initialised, [] { xmlInitParser(); });
+  const System::Computation computing; // libxml2 has locks of its own
   const LastErrorKeeper lastError;
   const Context context(*this);
   xmlParseDocument(context.parser);

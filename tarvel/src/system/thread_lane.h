@@ -6,7 +6,7 @@
 
 #include <cstddef>
 
-namespace Tarvel::Crypto {
+namespace Tarvel::System {
 
 /// Far enough apart for two processors never to share a line of their caches.
 constexpr std::size_t LANE_ALIGNMENT = 64;
@@ -14,4 +14,4 @@ constexpr std::size_t LANE_ALIGNMENT = 64;
 /// The calling thread's lane, one of `lanes`. Always the same for one thread; threads take lanes in turn.
 std::size_t GetThreadLane(std::size_t lanes) noexcept;
 
-} // namespace Tarvel::Crypto
+} // namespace Tarvel::System

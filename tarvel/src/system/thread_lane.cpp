@@ -1,10 +1,10 @@
 // SPDX-License-Identifier: Apache-2.0
 
-#include "crypto/thread_lane.h"
+#include "system/thread_lane.h"
 
 #include <atomic>
 
-namespace Tarvel::Crypto {
+namespace Tarvel::System {
 
 std::size_t GetThreadLane(std::size_t lanes) noexcept {
   static std::atomic<std::size_t> threads{0};
@@ -12,4 +12,4 @@ std::size_t GetThreadLane(std::size_t lanes) noexcept {
   return number % lanes;
 }
 
-} // namespace Tarvel::Crypto
+} // namespace Tarvel::System

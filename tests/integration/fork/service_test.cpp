@@ -1,0 +1,297 @@
+// SPDX-License-Identifier: Apache-2.0
+// A service of the parent, used by its child while the parent's operations are under way.
+
+#include "integration/fork/server_process.h"
+#include "support/data_file.h"
+#include "support/forked.h"
+#include "support/posting_server.h"
+#include "support/process_resources.h"
+#include "support/rendezvous.h"
+#include "support/soap_responses.h"
+#include "support/throws_message.h"
+
+#include <ssoclient/connection_spec.h>
+#include <ssoclient/create_saml_token.h>
+#include <ssoclient/exceptions.h>
+#include <ssoclient/security_token_service.h>
+#include <tarvel/http/user_agent.h>
+
+#include <gtest/gtest.h>
+
+#include <atomic>
+#include <memory>
+#include <string>
+#include <thread>
+#include <unistd.h>
+
+namespace SsoClient {
+namespace {
+
+using Tarvel::Exception;
+using Tarvel::Ref;
+using Testing::RunInChild;
+using Testing::ServerConnection;
+using Testing::ServerProcess;
+using Testing::Shared;
+using Testing::TlsSettings;
+using TokenPtr = std::shared_ptr<const SamlToken>;
+
+constexpr const char *SUBJECT = "{Name: alice; Domain:corp.example}";
+
+/// Answers each request with a token, but holds back the answer to users whose name says so.
+class Service {
+public:
+  explicit Service(bool isSecure)
+      : m_isSecure(isSecure), m_server([this](ServerConnection &peer) { Serve(peer); },
+                                       isSecure ? std::optional(TlsSettings()) : std::nullopt),
+        m_context(Testing::ContextThatTrustsTheTestAuthority()) {}
+
+  SecurityTokenServiceConfig GetConfig() const {
+    SecurityTokenServiceConfig config = Testing::ConfigFor(
+        std::string(m_isSecure ? "https" : "http") + "://localhost:" + std::to_string(m_server.GetPort()) + "/sts");
+    config.sslContext = m_context.get();
+    return config;
+  }
+  int GetPort() const { return m_server.GetPort(); }
+
+  /// Whether that many requests have come whose answers are held back.
+  bool WaitForHeld(int count) const {
+    return Testing::Eventually([this, count] { return *m_held >= count; });
+  }
+  void Answer() const { *m_answers = true; }
+
+private:
+  void Serve(ServerConnection &peer) const {
+    if (m_isSecure && !peer.ShakeHands()) {
+      return;
+    }
+    if (peer.ReadRequest().find("slow@corp.example") != std::string::npos) {
+      ++*m_held;
+      Testing::Eventually([this] { return m_answers->load(); });
+    }
+    const std::string body = Testing::IssueResponse(Testing::ReadDataFile("tokens/bearer.xml"));
+    peer.Write("HTTP/1.1 200 OK\r\nContent-Type: text/xml\r\nContent-Length: " + std::to_string(body.size()) +
+               "\r\n\r\n" + body);
+  }
+
+  const bool m_isSecure;
+  const Shared<std::atomic<int>> m_held;
+  const Shared<std::atomic<bool>> m_answers;
+  const ServerProcess m_server;
+  const Ref<Tarvel::Ssl::SSLContext> m_context;
+};
+
+TokenSpec Spec() {
+  TokenSpec spec;
+  spec.tokenLifetimeSec = 60;
+  return spec;
+}
+
+std::string Acquire(const SecurityTokenService &service, const std::string &user = "alice@corp.example") {
+  return service.AcquireToken(user, "pass", Spec())->GetSubject().ToString();
+}
+
+/// What the completion of one asynchronous operation is told.
+class Told {
+public:
+  SecurityTokenService::TokenCompletion ForToken() const {
+    return [state = m_state](const TokenPtr &token, const Exception *failure) {
+      state->text = failure ? failure->what() : token->GetSubject().ToString();
+      state->called.Add();
+    };
+  }
+  std::string Get() const { return m_state->called.WaitFor(1) ? m_state->text : "(never called)"; }
+
+private:
+  struct State {
+    std::string text;
+    Testing::EventCount called;
+  };
+  const std::shared_ptr<State> m_state = std::make_shared<State>();
+};
+
+std::string AcquireAsync(const SecurityTokenService &service) {
+  const Told told;
+  service.AcquireTokenAsync("alice@corp.example", "pass", Spec(), told.ForToken());
+  return told.Get();
+}
+
+class ServiceAfterFork : public testing::TestWithParam<bool> {
+protected:
+  const Service m_server{GetParam()};
+  const SecurityTokenServiceConfig m_config = m_server.GetConfig();
+  const std::shared_ptr<const SecurityTokenService> m_service = CreateSecurityTokenService(m_config);
+};
+
+TEST_P(ServiceAfterFork, TheChildOfAParentThatHasAcquiredAcquires) {
+  ASSERT_EQ(Acquire(*m_service), SUBJECT);
+  ASSERT_EQ(AcquireAsync(*m_service), SUBJECT);
+  EXPECT_EQ(RunInChild([&] {
+              EXPECT_EQ(Acquire(*m_service), SUBJECT);
+              EXPECT_EQ(AcquireAsync(*m_service), SUBJECT);
+              EXPECT_EQ(Acquire(*CreateSecurityTokenService(m_config)), SUBJECT);
+              EXPECT_EQ(RunInChild([&] { EXPECT_EQ(AcquireAsync(*m_service), SUBJECT); }), "") << "a child's child";
+            }),
+            "");
+  EXPECT_EQ(Acquire(*m_service), SUBJECT);
+  EXPECT_EQ(AcquireAsync(*m_service), SUBJECT);
+}
+
+TEST_P(ServiceAfterFork, TheChildAcquiresWhileItsParentsOperationsAreUnderWayAndHearsNothingOfThem) {
+  const Shared<std::atomic<int>> callsInChildren;
+  const pid_t parent = ::getpid();
+  Testing::EventCount done;
+  constexpr int OPERATIONS = 20;
+  for (int i = 0; i < OPERATIONS; ++i) {
+    m_service->AcquireTokenAsync("slow@corp.example", "pass", Spec(), [&](const TokenPtr &token, const Exception *) {
+      EXPECT_TRUE(token);
+      *callsInChildren += ::getpid() == parent ? 0 : 1;
+      done.Add();
+    });
+  }
+  std::thread waiting([&] { EXPECT_EQ(Acquire(*m_service, "slow@corp.example"), SUBJECT); });
+  ASSERT_TRUE(m_server.WaitForHeld(OPERATIONS + 1));
+  for (int i = 0; i < 5; ++i) {
+    EXPECT_EQ(RunInChild([&] {
+                EXPECT_EQ(Acquire(*m_service), SUBJECT);
+                EXPECT_EQ(AcquireAsync(*m_service), SUBJECT);
+              }),
+              "");
+  }
+  const pid_t late = Testing::StartChild([&] {
+    // The answers to the parent come while this child works.
+    m_server.Answer();
+    for (int i = 0; i < 10; ++i) {
+      EXPECT_EQ(Acquire(*m_service), SUBJECT);
+    }
+  });
+  EXPECT_EQ(Testing::WaitForChild(late), "");
+  EXPECT_TRUE(done.WaitFor(OPERATIONS)) << "each of the parent's operations gets its answer";
+  waiting.join();
+  EXPECT_EQ(*callsInChildren, 0);
+}
+
+TEST_P(ServiceAfterFork, ACompletionMayForkAndTheChildMayAcquire) {
+  std::string outcome = "never run";
+  Testing::EventCount done;
+  m_service->AcquireTokenAsync("alice@corp.example", "pass", Spec(), [&](const TokenPtr &, const Exception *) {
+    outcome = RunInChild([&] {
+      EXPECT_EQ(Acquire(*m_service), SUBJECT);
+      EXPECT_EQ(AcquireAsync(*m_service), SUBJECT);
+    });
+    done.Add();
+  });
+  ASSERT_TRUE(done.WaitFor(1));
+  EXPECT_EQ(outcome, "");
+  EXPECT_EQ(AcquireAsync(*m_service), SUBJECT);
+}
+
+/// Forks in its first leg; the child goes on with the acquisition that its parent began.
+class ForkingHandler final : public NegotiationHandler {
+public:
+  explicit ForkingHandler(pid_t &child) : m_child(child) {}
+  std::shared_ptr<std::vector<std::uint8_t>> NegotiateLeg(const std::vector<std::uint8_t> &) override {
+    m_child = ::fork();
+    return std::make_shared<std::vector<std::uint8_t>>(3, 'x');
+  }
+
+private:
+  pid_t &m_child;
+};
+
+// The service's answer is no leg, which both find once their requests have been answered.
+TEST_P(ServiceAfterFork, BothProcessesGoOnWithAnOperationWhoseHandlerForks) {
+  pid_t child = -1;
+  ForkingHandler handler(child);
+  const testing::AssertionResult refused = Testing::ThrowsMessage<SsoException>(
+      [&] { m_service->AcquireTokenByGSS(Spec(), handler); }, "Unexpected XML format");
+  if (child == 0) {
+    ::_exit(refused ? 0 : 1);
+  }
+  ASSERT_GT(child, 0);
+  EXPECT_TRUE(refused);
+  EXPECT_EQ(Testing::WaitForChild(child), "");
+}
+
+TEST_P(ServiceAfterFork, EachChildOfABusyParentVerifiesAndAcquires) {
+  const std::string xml = Testing::ReadDataFile("tokens/bearer.xml");
+  std::atomic<bool> stop{false};
+  const auto work = [&] {
+    while (!stop) {
+      EXPECT_EQ(Acquire(*m_service), SUBJECT);
+      EXPECT_EQ(CreateSamlToken(xml, m_config.signingCertificates)->GetSubject().ToString(), SUBJECT);
+      EXPECT_EQ(AcquireAsync(*m_service), SUBJECT);
+    }
+  };
+  std::thread first(work);
+  std::thread second(work);
+  for (int i = 0; i < 20; ++i) {
+    EXPECT_EQ(RunInChild([&] {
+                EXPECT_EQ(CreateSamlToken(xml, m_config.signingCertificates)->GetSubject().ToString(), SUBJECT);
+                EXPECT_EQ(Acquire(*m_service), SUBJECT);
+                EXPECT_EQ(AcquireAsync(*m_service), SUBJECT);
+              }),
+              "")
+        << i;
+  }
+  stop = true;
+  first.join();
+  second.join();
+}
+
+INSTANTIATE_TEST_SUITE_P(Transport, ServiceAfterFork, testing::Bool(),
+                         [](const auto &isSecure) { return isSecure.param ? "Tls" : "PlainHttp"; });
+
+/// A request to `port` that nobody answers, and that has begun.
+Ref<Tarvel::Http::PendingRequestItem> StartSlowRequest(const Service &server, const Ref<Tarvel::Http::UserAgent> &agent,
+                                                       const Shared<std::atomic<int>> &calls) {
+  Ref<Tarvel::Http::ClientRequest> request;
+  Tarvel::Http::CreateHttpRequest("POST", "/sts", request);
+  request->WriteBody("slow@corp.example");
+  Ref<Tarvel::Http::PendingRequestItem> pending;
+  agent->StartRequest(
+      request,
+      [&calls](const Exception *, const Ref<Tarvel::Http::ClientResponse> &,
+               const Ref<Tarvel::Http::PendingRequestItem> &) { ++*calls; },
+      pending);
+  EXPECT_TRUE(server.WaitForHeld(1));
+  return pending;
+}
+
+TEST(RequestAfterFork, AWaitInTheChildForARequestOfTheParentEndsAtOnce) {
+  const Service server(false);
+  const Shared<std::atomic<int>> calls;
+  Ref<Tarvel::Http::ConnectionSpec> spec;
+  CreateSsoConnectionSpec("localhost", server.GetPort(), false, spec);
+  Ref<Tarvel::Http::CookieStore> cookies;
+  Tarvel::Http::CreateCookieStore("", cookies);
+  Ref<Tarvel::Http::UserAgent> agent;
+  Tarvel::Http::CreateHttpUserAgent(spec, cookies, nullptr, agent);
+  const Ref<Tarvel::Http::PendingRequestItem> pending = StartSlowRequest(server, agent, calls);
+  Ref<Tarvel::Http::ClientResponse> response;
+  EXPECT_EQ(RunInChild([&] {
+              EXPECT_TRUE(pending->IsDone());
+              pending->Cancel();
+              EXPECT_TRUE(Testing::ThrowsMessage<Tarvel::System::NetworkException>(
+                  [&] { agent->WaitForRequest(pending, std::int64_t{240} * 1000000, response); },
+                  "The request to localhost:" + std::to_string(server.GetPort()) +
+                      " was under way when the process forked: its parent goes on with it"));
+            }),
+            "");
+  EXPECT_EQ(*calls, 0);
+  EXPECT_FALSE(pending->IsDone());
+  server.Answer();
+  agent->WaitForRequest(pending, std::int64_t{60} * 1000000, response);
+  EXPECT_EQ(response->GetStatusCode(), 200);
+  EXPECT_EQ(*calls, 1);
+  EXPECT_EQ(RunInChild([&] {
+              Ref<Tarvel::Http::ClientResponse> known;
+              agent->WaitForRequest(pending, 0, known);
+              EXPECT_EQ(known->GetStatusCode(), 200);
+            }),
+            "")
+      << "a request that was done before the fork";
+}
+
+} // namespace
+} // namespace SsoClient
