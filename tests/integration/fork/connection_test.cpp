@@ -173,6 +173,21 @@ TEST(SocketAfterFork, NoCompletionOfTheParentRunsInTheChild) {
   EXPECT_TRUE(Testing::Eventually([&] { return *calls == 1; }));
 }
 
+TEST(SocketAfterFork, AConnectOfTheParentIsNotReportedInTheChild) {
+  const Testing::FullPort silent;
+  const Shared<std::atomic<int>> calls;
+  const Ref<System::TcpClientSocket> socket = System::CreateTcpClientSocket();
+  socket->AsyncConnect("127.0.0.1", silent.GetPort(), [&calls](const Exception *) { ++*calls; });
+  EXPECT_EQ(RunInChild([&] {
+              socket->Close();
+              EXPECT_TRUE(Testing::DrainIoThreads());
+            }),
+            "");
+  EXPECT_EQ(*calls, 0);
+  socket->Close();
+  EXPECT_TRUE(Testing::Eventually([&] { return *calls == 1; }));
+}
+
 TEST(SocketAfterFork, ACompletionMayForkAndTheChildMayConnect) {
   const ServerProcess server(Echo);
   std::string outcome = "never run";
@@ -247,14 +262,22 @@ TEST_P(TlsAfterFork, AContextOfTheParentServesTheChildWithoutAnySessionOfThePare
   connect(false);
   const std::size_t sessions = countSessions();
   ASSERT_GT(sessions, 0u);
-  TlsClient open(context, server.GetPort());
-  ASSERT_EQ(open.ShakeHands(), "");
-  ASSERT_EQ(open.Write("hello"), "");
-  ASSERT_EQ(open.Read(), "hello");
+  const auto connectAndStay = [&] {
+    auto open = std::make_unique<TlsClient>(context, server.GetPort());
+    EXPECT_EQ(open->ShakeHands(), "");
+    EXPECT_EQ(open->Write("hello"), "");
+    EXPECT_EQ(open->Read(), "hello");
+    return open;
+  };
+  const std::unique_ptr<TlsClient> closed = connectAndStay();
+  std::unique_ptr<TlsClient> dropped = connectAndStay();
+  ASSERT_TRUE(Testing::DrainIoThreads()); // no I/O thread holds the stream
   const std::size_t left = countSessions();
   EXPECT_EQ(RunInChild([&] {
               EXPECT_EQ(countSessions(), 0u);
-              open.GetStream()->Close(); // whose sessions are not for the child either
+              // Their sessions are not for the child either.
+              closed->GetStream()->Close();
+              dropped.reset();
               EXPECT_EQ(countSessions(), 0u);
               connect(false);
               connect(true);
