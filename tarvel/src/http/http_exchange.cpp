@@ -252,7 +252,6 @@ void HttpExchange::Complete(const UserAgent::CompletionFunction &completion, con
   if (!completion) {
     return;
   }
-  const System::HostCall call;
   try {
     completion(failure, response, Ref<PendingRequestItem>(this));
   } catch (...) {

@@ -9,6 +9,7 @@
 #include <gtest/gtest.h>
 
 #include <atomic>
+#include <chrono>
 #include <mutex>
 #include <optional>
 #include <pthread.h>
@@ -30,6 +31,7 @@ void HoldUntilAForkWaits(Holder &holder, Testing::EventCount &held, std::atomic<
   while (!IsForkUnderWay()) {
     std::this_thread::yield();
   }
+  std::this_thread::sleep_for(std::chrono::milliseconds(20)); // which a fork that does not wait does not take
   released = true;
   holder.unlock();
 }

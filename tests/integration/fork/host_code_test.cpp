@@ -18,6 +18,7 @@
 #include <gtest/gtest.h>
 
 #include <atomic>
+#include <chrono>
 #include <string>
 #include <string_view>
 #include <thread>
@@ -51,11 +52,11 @@ TEST(ForkBesideTheHostsCode, DoesNotWaitForALogSink) {
 TEST(ForkBesideTheHostsCode, DoesNotWaitForAPassphrase) {
   Gate gate;
   std::thread loading([&gate] {
-    EXPECT_THROW(static_cast<void>(Crypto::CreatePrivateKey(Testing::ReadDataFile("crypto/p256-encrypted.key"),
-                                                            [&gate]() -> std::string {
-                                                              gate.Pass();
-                                                              return "wrong";
-                                                            })),
+    EXPECT_THROW(static_cast<void>(Crypto::LoadPrivateKey("file:" + Testing::DataPath("crypto/p256-encrypted.key"),
+                                                          [&gate]() -> std::string {
+                                                            gate.Pass();
+                                                            return "wrong";
+                                                          })),
                  Crypto::WrongPassphraseException);
   });
   ExpectForkWhileHeldAt(gate);
@@ -99,6 +100,7 @@ public:
     while (!System::IsForkUnderWay()) {
       std::this_thread::yield();
     }
+    std::this_thread::sleep_for(std::chrono::milliseconds(20)); // which a fork that does not wait does not take
     m_over = true;
   }
   void EndElement() override {}
