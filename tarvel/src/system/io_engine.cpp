@@ -8,8 +8,11 @@
 #include <tarvel/core/exception.h>
 
 #include <boost/asio/executor_work_guard.hpp>
+#include <boost/asio/ip/tcp.hpp>
+#include <boost/asio/steady_timer.hpp>
+#include <boost/system/system_error.hpp>
 
-#include <memory>
+#include <string>
 
 namespace Tarvel::System {
 
@@ -21,19 +24,30 @@ constexpr int IO_THREADS = 2;
 class IoEngine {
 public:
   IoEngine() {
+    OpenDescriptors();
     StartBackgroundThread("tarvel-io", [this] { Run(); }).detach();
     try {
       for (int started = 1; started < IO_THREADS; ++started) {
         StartBackgroundThread("tarvel-io", [this] { Run(); }).detach();
       }
-    } catch (const InvalidStateException &) {
-      // One thread does the same work, only later.
+    } catch (...) {
+      // One thread does the same work, only later; and it uses this object already.
     }
   }
 
   boost::asio::io_context &GetContext() noexcept { return m_context; }
 
 private:
+  /// Asio opens what it waits on with the first socket or timer: here, so that no later one can fail for it.
+  void OpenDescriptors() {
+    try {
+      const boost::asio::ip::tcp::socket socket(m_context);
+      const boost::asio::steady_timer timer(m_context);
+    } catch (const boost::system::system_error &error) {
+      throw InvalidStateException("Cannot wait for the network: " + error.code().message());
+    }
+  }
+
   void Run() noexcept {
     for (;;) {
       try {
