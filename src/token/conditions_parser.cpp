@@ -69,11 +69,11 @@ void ParseConditionsElement(NodeFilterIterator &iterator, ConditionsType &condit
 
 bool TryParseDelegationRestriction(NodeFilterIterator &iterator,
                                    boost::optional<DelegationRestrictionType> &restriction) {
-  const ElementNode *const element = ConditionOfType(iterator, SchemaNames::DELEGATION_RESTRICTION_TYPE);
+  const ElementNode *const element = ConditionOfType(iterator, SchemaNames::DelegationRestrictionType());
   if (!element) {
     return false;
   }
-  RequireElementAttributesQNames(*element, {SchemaNames::XSI_TYPE}, {});
+  RequireElementAttributesQNames(*element, {SchemaNames::XsiType()}, {});
   restriction.emplace();
   NodeFilterIterator child = iterator.GetChild();
   do {
@@ -122,11 +122,11 @@ bool TryParseProxyRestriction(NodeFilterIterator &iterator, boost::optional<Prox
 }
 
 bool TryParseRenewRestriction(NodeFilterIterator &iterator, boost::optional<RenewRestrictionType> &restriction) {
-  const ElementNode *const element = ConditionOfType(iterator, SchemaNames::RENEW_RESTRICTION_TYPE);
+  const ElementNode *const element = ConditionOfType(iterator, SchemaNames::RenewRestrictionType());
   if (!element) {
     return false;
   }
-  RequireElementAttributesQNames(*element, {SchemaNames::XSI_TYPE},
+  RequireElementAttributesQNames(*element, {SchemaNames::XsiType()},
                                  {LocalName("Count"), LocalName("Postdatable"), LocalName("RenewExpired")});
   restriction.emplace();
   GetULongOptionalAttribute(*element, "Count", restriction->Count);

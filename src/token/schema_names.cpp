@@ -9,10 +9,24 @@ namespace SsoClient::SchemaNames {
 
 using Tarvel::Xml::QName;
 
-// Never destroyed: a token may be read on a thread of the pool while the process ends.
-const QName &XSI_TYPE = *new QName(std::string(Namespaces::XSI), "type");
-const QName &KEY_INFO_CONFIRMATION_DATA_TYPE = *new QName(std::string(Namespaces::SAML), "KeyInfoConfirmationDataType");
-const QName &DELEGATION_RESTRICTION_TYPE = *new QName(std::string(Namespaces::DELEGATION), "DelegationRestrictionType");
-const QName &RENEW_RESTRICTION_TYPE = *new QName(std::string(Namespaces::RSA_SAML2), "RenewRestrictionType");
+const QName &XsiType() {
+  static const QName &name = *new QName(std::string(Namespaces::XSI), "type");
+  return name;
+}
+
+const QName &KeyInfoConfirmationDataType() {
+  static const QName &name = *new QName(std::string(Namespaces::SAML), "KeyInfoConfirmationDataType");
+  return name;
+}
+
+const QName &DelegationRestrictionType() {
+  static const QName &name = *new QName(std::string(Namespaces::DELEGATION), "DelegationRestrictionType");
+  return name;
+}
+
+const QName &RenewRestrictionType() {
+  static const QName &name = *new QName(std::string(Namespaces::RSA_SAML2), "RenewRestrictionType");
+  return name;
+}
 
 } // namespace SsoClient::SchemaNames

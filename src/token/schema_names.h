@@ -8,9 +8,12 @@
 
 namespace SsoClient::SchemaNames {
 
-extern const Tarvel::Xml::QName &XSI_TYPE;
-extern const Tarvel::Xml::QName &KEY_INFO_CONFIRMATION_DATA_TYPE;
-extern const Tarvel::Xml::QName &DELEGATION_RESTRICTION_TYPE;
-extern const Tarvel::Xml::QName &RENEW_RESTRICTION_TYPE;
+// Built with the first use, so that a static object of the host may read a token before this library's files have been
+// initialised; and never destroyed, for a token may be read while the process ends.
+
+const Tarvel::Xml::QName &XsiType();
+const Tarvel::Xml::QName &KeyInfoConfirmationDataType();
+const Tarvel::Xml::QName &DelegationRestrictionType();
+const Tarvel::Xml::QName &RenewRestrictionType();
 
 } // namespace SsoClient::SchemaNames

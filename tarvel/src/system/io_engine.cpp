@@ -9,12 +9,14 @@
 #include <tarvel/core/exception.h>
 
 #include <boost/asio/executor_work_guard.hpp>
+#include <boost/asio/ip/tcp.hpp>
+#include <boost/asio/steady_timer.hpp>
 #include <boost/system/system_error.hpp>
 
 #include <atomic>
 #include <memory>
 #include <mutex>
-#include <new>
+#include <string>
 
 namespace Tarvel::System {
 
@@ -37,7 +39,11 @@ Descriptors &GetDescriptors() {
 class IoEngine final : public ForkListener {
 public:
   /// @throws boost::system::system_error without a descriptor.
-  IoEngine() = default;
+  IoEngine() {
+    // Asio opens what it waits on with the first socket or timer: here, so that no later one can fail for it.
+    const boost::asio::ip::tcp::socket socket(m_context);
+    const boost::asio::steady_timer timer(m_context);
+  }
 
   /// @throws InvalidStateException when not one thread can be started.
   void Start() {
@@ -128,7 +134,7 @@ IoEngine &StartEngine() {
     engine.store(fresh.get());
     return *fresh.release();
   } catch (const boost::system::system_error &error) {
-    throw InvalidStateException(std::string("Cannot start the network: ") + error.code().message());
+    throw InvalidStateException(std::string("Cannot wait for the network: ") + error.code().message());
   }
 }
 

@@ -13,7 +13,7 @@ namespace Tarvel::System {
 /// shared by everything that is pending, so a handler must never block; what it throws is logged and lost. A child
 /// process made by `fork` has a context and threads of its own, which start with its own first call. Whatever is done with
 /// the context, its sockets and its timers is done within a `Computation`; its threads are in one already.
-/// @throws InvalidStateException when the first thread cannot be started.
+/// @throws InvalidStateException when the first thread cannot be started, or there is no descriptor to wait with.
 boost::asio::io_context &GetIoContext();
 
 /// An object that holds a descriptor of the I/O threads, and closes it in a child of this process. The constructor and the

@@ -12,7 +12,9 @@
 #include <mutex>
 #include <netdb.h>
 #include <netinet/in.h>
+#include <sys/eventfd.h>
 #include <system_error>
+#include <unistd.h>
 #include <utility>
 
 namespace Tarvel::System {
@@ -63,17 +65,35 @@ void AppendAddress(AddressList &addresses, const sockaddr &socketAddress) {
   }
 }
 
+/// The system's error when it has no descriptor left, else 0. The resolver then says that the name is not known; the truth
+/// is in what `errno` was left at, or else in that no descriptor can be opened now.
+int FindLackOfDescriptors(int errorOfResolver) noexcept {
+  if (errorOfResolver == EMFILE || errorOfResolver == ENFILE) {
+    return errorOfResolver;
+  }
+  const int descriptor = ::eventfd(0, EFD_CLOEXEC);
+  if (descriptor >= 0) {
+    ::close(descriptor);
+    return 0;
+  }
+  return errno == EMFILE || errno == ENFILE ? errno : 0;
+}
+
+std::string DescribeFailure(int failure, int systemError) {
+  if (const int lack = FindLackOfDescriptors(systemError)) {
+    return std::system_category().message(lack);
+  }
+  return failure == EAI_SYSTEM ? std::system_category().message(systemError) : gai_strerror(failure);
+}
+
 AddressList AskSystem(const std::string &host) {
   addrinfo hints{};
   hints.ai_family = AF_UNSPEC;
   hints.ai_socktype = SOCK_STREAM; // else each address comes once for each kind of socket
   addrinfo *found = nullptr;
-  const int failure = getaddrinfo(host.c_str(), nullptr, &hints, &found);
-  if (failure == EAI_SYSTEM) {
-    throw NetworkException(std::system_category().message(errno));
-  }
-  if (failure != 0) {
-    throw NetworkException(gai_strerror(failure));
+  errno = 0;
+  if (const int failure = getaddrinfo(host.c_str(), nullptr, &hints, &found)) {
+    throw NetworkException(DescribeFailure(failure, errno));
   }
   const std::unique_ptr<addrinfo, AddressInfoDeleter> list(found);
   AddressList addresses;

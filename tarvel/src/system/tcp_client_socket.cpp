@@ -2,9 +2,8 @@
 
 #include "system/tcp_client_socket.h"
 
-#include "system/endless_thread_pool.h"
 #include "system/io_engine.h"
-#include "system/uncaught_exception.h"
+#include "system/shared_lookup.h"
 
 #include <tarvel/core/exception.h>
 
@@ -28,15 +27,11 @@ namespace {
 
 constexpr int MAX_PORT = 65535;
 
-/// A resolver that hangs keeps its thread: so many may hang before further lookups have to wait.
-constexpr std::size_t MAX_LOOKUP_THREADS = 64;
-constexpr std::chrono::milliseconds LOOKUP_IDLE_TIME{500};
-
-ThreadPool &LookupPool() {
+/// What a completion gets when there is no memory to say more.
+const NetworkException &OutOfMemory() {
   const Computation computing;
-  // Never destroyed, as nobody can end a lookup.
-  static ThreadPool *const pool = CreateEndlessThreadPool(MAX_LOOKUP_THREADS, LOOKUP_IDLE_TIME).Detach();
-  return *pool;
+  static const NetworkException *const failure = new NetworkException("Out of memory"); // never destroyed
+  return *failure;
 }
 
 /// Why no connection to `host` can be tried; empty when it can.
@@ -60,6 +55,18 @@ std::string RefuseTarget(std::string_view host, int port) {
 
 std::string WithoutBrackets(const std::string &host) {
   return host.size() > 2 && host.front() == '[' && host.back() == ']' ? host.substr(1, host.size() - 2) : host;
+}
+
+/// The address that `host` is; unspecific, with an error, when it is none.
+asio::ip::address ParseAddress(const std::string &host, error_code &error) {
+  return asio::ip::make_address(WithoutBrackets(host), error);
+}
+
+/// How messages name the endpoint.
+std::string DescribeTarget(const std::string &host, int port) {
+  error_code notAnAddress;
+  const bool needsBrackets = ParseAddress(host, notAnAddress).is_v6() && host.front() != '[';
+  return (needsBrackets ? "[" + host + "]" : host) + ":" + std::to_string(port);
 }
 
 template <typename Failure>
@@ -89,7 +96,9 @@ struct TcpClientSocketImpl::PendingWrite {
   TransferHandler handler;
 };
 
-TcpClientSocketImpl::TcpClientSocketImpl() : m_socket(GetIoContext()), m_attemptTimer(GetIoContext()) {
+TcpClientSocketImpl::TcpClientSocketImpl()
+    : m_socket(GetIoContext()), m_connectEnd(GetIoContext()), m_attemptTimer(GetIoContext()) {
+  OutOfMemory(); // made while there is memory
   Enter();
 }
 
@@ -99,6 +108,7 @@ TcpClientSocketImpl::~TcpClientSocketImpl() {
   error_code ignored; // the descriptor is gone in any case
   m_socket.close(ignored);
   m_attemptTimer.cancel(ignored);
+  m_connectEnd.cancel(ignored);
 }
 
 void TcpClientSocketImpl::CloseInChild() noexcept {
@@ -114,54 +124,66 @@ void TcpClientSocketImpl::AsyncConnect(const std::string &host, int port, Connec
     PostConnectFailure(std::move(handler), InvalidStateException("The socket has been used or closed already"));
     return;
   }
-  m_stage = Stage::CONNECTING;
-  m_target = host + ":" + std::to_string(port);
+  m_target = DescribeTarget(host, port);
   m_port = port;
+  m_connectEnd.expires_at(std::chrono::steady_clock::time_point::max());
+  m_connectEnd.async_wait([self = Ref(this)](const error_code &) { self->OnConnectEnd(); });
   m_connectHandler = std::move(handler);
-  if (const std::string refusal = RefuseTarget(host, port); !refusal.empty()) {
-    GiveUpConnect(refusal);
+  m_stage = Stage::CONNECTING;
+  TryStep([this, &host] { StartConnect(host); });
+}
+
+/// Whatever goes wrong in a step of the connect, memory that runs out included, is how the connect ends.
+template <typename Step>
+void TcpClientSocketImpl::TryStep(const Step &step) noexcept {
+  try {
+    step();
+  } catch (const std::bad_alloc &) {
+    EndConnect("out of memory");
+  } catch (const std::exception &failure) {
+    EndConnect(failure.what());
+  } catch (...) {
+    EndConnect("unknown failure");
+  }
+}
+
+void TcpClientSocketImpl::StartConnect(const std::string &host) {
+  if (const std::string refusal = RefuseTarget(host, m_port); !refusal.empty()) {
+    EndConnect(refusal);
     return;
   }
-  const std::string name = WithoutBrackets(host);
   error_code notAnAddress;
-  const asio::ip::address address = asio::ip::make_address(name, notAnAddress);
+  const asio::ip::address address = ParseAddress(host, notAnAddress);
   if (!notAnAddress) {
     TryAddresses({address});
     return;
   }
-  if (name != host) {
-    GiveUpConnect("only an IPv6 address may stand in brackets");
+  if (WithoutBrackets(host) != host) {
+    EndConnect("only an IPv6 address may stand in brackets");
     return;
   }
-  try {
-    m_lookup = LookupPool().QueueWorkItem([self = Ref(this), name] { self->LookUpAndConnect(name); });
-  } catch (const Exception &noThread) {
-    GiveUpConnect(noThread.what());
-  }
+  m_lookup =
+      StartSharedLookup(host, [self = Ref(this)](const AddressList &addresses, const std::exception_ptr &failure) {
+        self->OnLookup(addresses, failure);
+      });
 }
 
-// On a thread of the lookup pool, and perhaps long after the socket was closed.
-void TcpClientSocketImpl::LookUpAndConnect(const std::string &host) {
-  AddressList addresses;
-  std::string failure;
-  try {
-    addresses = LookUpName(host);
-  } catch (const std::exception &exception) {
-    failure = exception.what();
-  }
+// On a thread of the look-ups, and perhaps while the socket is being closed.
+void TcpClientSocketImpl::OnLookup(const AddressList &addresses, const std::exception_ptr &failure) {
   const std::lock_guard<ForkSafeMutex> lock(m_mutex);
+  m_lookup.reset();
   if (m_stage != Stage::CONNECTING) {
     return;
   }
-  if (addresses.empty()) {
-    GiveUpConnect(failure);
-    return;
-  }
-  TryAddresses(std::move(addresses));
+  TryStep([&] {
+    if (failure) {
+      std::rethrow_exception(failure);
+    }
+    TryAddresses(addresses);
+  });
 }
 
 void TcpClientSocketImpl::TryAddresses(AddressList addresses) {
-  m_lookup.reset();
   m_addresses = std::move(addresses);
   TryNextAddress();
 }
@@ -178,7 +200,7 @@ void TcpClientSocketImpl::TryNextAddress() {
     }
     NoteFailedAttempt(error);
   }
-  GiveUpConnect(m_attempts);
+  EndConnect(m_attempts);
 }
 
 // An address that swallows packets must not use up the time that the others are worth.
@@ -218,19 +240,21 @@ void TcpClientSocketImpl::OnConnectAttempt(const error_code &error) {
   {
     const std::lock_guard<ForkSafeMutex> lock(m_mutex);
     if (m_stage != Stage::CONNECTING) {
-      return; // closed meanwhile, and the handler told so
+      return; // ended meanwhile, which the handler learns from `OnConnectEnd`
     }
     error_code ignored;
     m_attemptTimer.cancel(ignored);
     if (error) {
-      NoteFailedAttempt(m_isAttemptOverdue ? asio::error::make_error_code(asio::error::timed_out) : error);
-      TryNextAddress();
+      TryStep([this, &error] {
+        NoteFailedAttempt(m_isAttemptOverdue ? asio::error::make_error_code(asio::error::timed_out) : error);
+        TryNextAddress();
+      });
       return;
     }
     m_stage = Stage::CONNECTED;
     m_socket.set_option(tcp::no_delay(true), ignored); // without it the connection is slow, not wrong
-    handler = std::move(m_connectHandler);
-    m_connectHandler = nullptr;
+    handler.swap(m_connectHandler);
+    m_connectEnd.cancel(ignored); // which finds no handler then
   }
   const HostCall call;
   handler(nullptr);
@@ -246,10 +270,31 @@ void TcpClientSocketImpl::NoteFailedAttempt(const error_code &error) {
   m_attempts.append(error.message());
 }
 
-void TcpClientSocketImpl::GiveUpConnect(const std::string &reason) {
+void TcpClientSocketImpl::EndConnect(std::string_view reason) noexcept {
   m_stage = Stage::ENDED;
-  PostConnectFailure(std::exchange(m_connectHandler, nullptr),
-                     NetworkException("Cannot connect to " + m_target + ": " + reason));
+  try {
+    m_connectFailure = NetworkException("Cannot connect to " + m_target + ": " + std::string(reason));
+  } catch (...) {
+    m_connectFailure = OutOfMemory();
+  }
+  error_code ignored;
+  m_socket.close(ignored);
+  m_attemptTimer.cancel(ignored);
+  m_connectEnd.cancel(ignored);
+}
+
+void TcpClientSocketImpl::OnConnectEnd() {
+  ConnectHandler handler;
+  std::optional<NetworkException> failure;
+  {
+    const std::lock_guard<ForkSafeMutex> lock(m_mutex);
+    handler.swap(m_connectHandler);
+    failure = m_connectFailure;
+  }
+  if (handler) {
+    const HostCall call;
+    handler(&*failure);
+  }
 }
 
 bool TcpClientSocketImpl::IsConnectDone() const noexcept {
@@ -258,30 +303,22 @@ bool TcpClientSocketImpl::IsConnectDone() const noexcept {
 }
 
 void TcpClientSocketImpl::Close() noexcept {
-  ConnectHandler handler;
   Ref<ScheduledItem> lookup;
   {
     const std::lock_guard<ForkSafeMutex> lock(m_mutex);
     if (m_isOfParent) {
       return;
     }
+    if (m_stage == Stage::CONNECTING) {
+      EndConnect("cancelled");
+    }
     m_stage = Stage::ENDED;
     error_code ignored; // the descriptor is gone in any case
     m_socket.close(ignored);
-    m_attemptTimer.cancel(ignored);
-    handler.swap(m_connectHandler);
     lookup = std::move(m_lookup);
   }
   if (lookup) {
     lookup->Cancel();
-  }
-  if (!handler) {
-    return;
-  }
-  try {
-    PostConnectFailure(std::move(handler), NetworkException("Cannot connect to " + m_target + ": cancelled"));
-  } catch (...) {
-    LogUncaughtException("the cancellation of a connect");
   }
 }
 
@@ -336,29 +373,33 @@ void TcpClientSocketImpl::AsyncWrite(const char *bytes, std::size_t length, Tran
     PostTransferFailure(std::move(handler), DescribeTransferFailure(m_writeEnd));
     return;
   }
-  WriteSome(std::make_unique<PendingWrite>(PendingWrite{bytes, length, 0, std::move(handler)}));
+  WriteSome(std::make_shared<PendingWrite>(PendingWrite{bytes, length, 0, std::move(handler)}));
 }
 
 // Under the lock.
-void TcpClientSocketImpl::WriteSome(std::unique_ptr<PendingWrite> pending) {
+void TcpClientSocketImpl::WriteSome(const std::shared_ptr<PendingWrite> &pending) {
   const asio::const_buffer rest(pending->bytes + pending->written, pending->length - pending->written);
-  m_socket.async_write_some(
-      rest, [self = Ref(this), pending = std::move(pending)](const error_code &error, std::size_t count) mutable {
-        self->OnWritten(std::move(pending), error, count);
-      });
+  m_socket.async_write_some(rest, [self = Ref(this), pending](const error_code &error, std::size_t count) {
+    self->OnWritten(pending, error, count);
+  });
 }
 
-void TcpClientSocketImpl::OnWritten(std::unique_ptr<PendingWrite> pending, const error_code &error, std::size_t count) {
+void TcpClientSocketImpl::OnWritten(const std::shared_ptr<PendingWrite> &pending, const error_code &error,
+                                    std::size_t count) {
   pending->written += count;
   error_code result = error;
   {
     const std::lock_guard<ForkSafeMutex> lock(m_mutex);
-    if (!result && pending->written < pending->length) {
-      if (m_stage == Stage::CONNECTED) {
-        WriteSome(std::move(pending));
-        return;
-      }
+    if (!result && pending->written < pending->length && m_stage != Stage::CONNECTED) {
       result = asio::error::operation_aborted;
+    }
+    if (!result && pending->written < pending->length) {
+      try {
+        WriteSome(pending);
+        return;
+      } catch (...) {
+        result = asio::error::no_memory;
+      }
     }
     m_writeEnd = result;
   }
@@ -372,14 +413,18 @@ void TcpClientSocketImpl::OnWritten(std::unique_ptr<PendingWrite> pending, const
   pending->handler(pending->written, &failure);
 }
 
-NetworkException TcpClientSocketImpl::DescribeTransferFailure(const error_code &error) const {
-  if (error == asio::error::operation_aborted) {
-    return NetworkException("The connection to " + m_target + " was closed by this side");
+NetworkException TcpClientSocketImpl::DescribeTransferFailure(const error_code &error) const noexcept {
+  try {
+    if (error == asio::error::operation_aborted) {
+      return NetworkException("The connection to " + m_target + " was closed by this side");
+    }
+    if (error == asio::error::not_connected) {
+      return NetworkException("There is no connection" + (m_target.empty() ? m_target : " to " + m_target));
+    }
+    return NetworkException("The connection to " + m_target + " broke: " + error.message());
+  } catch (...) {
+    return OutOfMemory();
   }
-  if (error == asio::error::not_connected) {
-    return NetworkException("There is no connection" + (m_target.empty() ? m_target : " to " + m_target));
-  }
-  return NetworkException("The connection to " + m_target + " broke: " + error.message());
 }
 
 } // namespace Tarvel::System

@@ -14,7 +14,9 @@
 #include <boost/asio/steady_timer.hpp>
 
 #include <chrono>
+#include <exception>
 #include <memory>
+#include <optional>
 #include <string>
 #include <string_view>
 
@@ -44,29 +46,34 @@ private:
 
   void CloseInChild() noexcept override;
 
-  // Of the connect. Those that begin with "Try" or "Give" are called under the lock.
-  void LookUpAndConnect(const std::string &host);
+  // Of the connect. All but those that begin with "On" are called under the lock.
+  void StartConnect(const std::string &host);
+  void OnLookup(const AddressList &addresses, const std::exception_ptr &failure);
   void TryAddresses(AddressList addresses);
   void TryNextAddress();
-  void GiveUpConnect(const std::string &reason);
   bool OpenSocket(const boost::asio::ip::tcp::endpoint &endpoint, boost::system::error_code &error);
   void OnConnectAttempt(const boost::system::error_code &error);
   void LimitAttempt();
   void NoteFailedAttempt(const boost::system::error_code &error);
+  template <typename Step>
+  void TryStep(const Step &step) noexcept;
+  void EndConnect(std::string_view reason) noexcept;
+  void OnConnectEnd();
 
   struct PendingWrite;
-  void WriteSome(std::unique_ptr<PendingWrite> pending);
-  void OnWritten(std::unique_ptr<PendingWrite> pending, const boost::system::error_code &error, std::size_t count);
+  void WriteSome(const std::shared_ptr<PendingWrite> &pending);
+  void OnWritten(const std::shared_ptr<PendingWrite> &pending, const boost::system::error_code &error,
+                 std::size_t count);
   void OnRead(const TransferHandler &handler, const boost::system::error_code &error, std::size_t count);
   void CompleteRead(const TransferHandler &handler, const boost::system::error_code &error, std::size_t count) const;
 
-  NetworkException DescribeTransferFailure(const boost::system::error_code &error) const;
+  NetworkException DescribeTransferFailure(const boost::system::error_code &error) const noexcept;
 
   mutable ForkSafeMutex m_mutex; // guards all that follows; never held while a handler runs
   boost::asio::ip::tcp::socket m_socket;
   Stage m_stage = Stage::FRESH;
   bool m_isOfParent = false; // so that nobody is to be called
-  std::string m_target;      // "host:port", for messages; set once
+  std::string m_target;      // "host:port" or "[v6 address]:port", for messages; set once
   int m_port = 0;
 
   // How reading and writing ended: Asio may wait for ever when it is asked again.
@@ -75,6 +82,9 @@ private:
 
   // While connecting.
   ConnectHandler m_connectHandler;
+  boost::asio::steady_timer
+      m_connectEnd; // never expires: cancelled, it calls the handler, and needs no memory for that
+  std::optional<NetworkException> m_connectFailure;
   Ref<ScheduledItem> m_lookup;
   AddressList m_addresses;
   std::size_t m_nextAddress = 0;

@@ -6,6 +6,7 @@
 #include "support/forked.h"
 #include "support/process_resources.h"
 #include "support/rendezvous.h"
+#include "system/name_lookup.h"
 #include "unit/tarvel_ssl/tls_client.h"
 
 #include <tarvel/system/stream.h>
@@ -185,6 +186,34 @@ TEST(SocketAfterFork, AConnectOfTheParentIsNotReportedInTheChild) {
             "");
   EXPECT_EQ(*calls, 0);
   socket->Close();
+  EXPECT_TRUE(Testing::Eventually([&] { return *calls == 1; }));
+}
+
+TEST(SocketAfterFork, TheChildLooksUpANameAnewThatItsParentIsLookingUp) {
+  const ServerProcess server(Echo);
+  const Shared<std::atomic<int>> calls;
+  const pid_t parent = ::getpid();
+  const auto gate = std::make_shared<Testing::Gate>();
+  const System::ScopedNameLookup lookup([gate, parent](const std::string &) {
+    if (::getpid() == parent) {
+      gate->Pass();
+    }
+    return System::AddressList{boost::asio::ip::address_v4::loopback()};
+  });
+  const Ref<System::TcpClientSocket> socket = System::CreateTcpClientSocket();
+  socket->AsyncConnect("sts.example", server.GetPort(), [&calls](const Exception *) { ++*calls; });
+  ASSERT_TRUE(gate->WaitForArrivals(1));
+  EXPECT_EQ(RunInChild([&] {
+              const Ref<System::TcpClientSocket> own = System::CreateTcpClientSocket();
+              Completion connected;
+              own->AsyncConnect("sts.example", server.GetPort(), connected.ForEnd());
+              EXPECT_EQ(connected.GetMessage(), "");
+              socket->Close();
+              EXPECT_TRUE(Testing::DrainIoThreads());
+              EXPECT_EQ(*calls, 0);
+            }),
+            "");
+  gate->Open();
   EXPECT_TRUE(Testing::Eventually([&] { return *calls == 1; }));
 }
 

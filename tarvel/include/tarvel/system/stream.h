@@ -51,6 +51,11 @@ protected:
   ~Stream() override;
 };
 
+/// How many host names are looked up at a time. Nothing can interrupt the system's resolver, so that a name that gets no
+/// answer holds one of these places until the resolver gives up, however many connections ask for it: look-ups of one name
+/// at the same time are one, in whatever letter case. Up to 63 such names hold up no other.
+constexpr std::size_t MAX_NAME_LOOKUPS = 64;
+
 /// A TCP connection to be made.
 class TARVEL_API TcpClientSocket : public Stream {
 public:

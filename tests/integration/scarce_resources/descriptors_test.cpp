@@ -1,0 +1,110 @@
+// SPDX-License-Identifier: Apache-2.0
+// No descriptor left. Each test is a process of its own, whose first use of the network this is.
+#include "outcome.h"
+
+#include "support/data_file.h"
+#include "support/posting_server.h"
+#include "support/soap_responses.h"
+
+#include <gtest/gtest.h>
+
+#include <cstdlib>
+#include <fcntl.h>
+#include <iostream>
+#include <string>
+#include <sys/resource.h>
+#include <unistd.h>
+#include <vector>
+
+namespace Testing {
+namespace {
+
+/// Uses up the process's descriptors but `spare` ones, for as long as it lives.
+class UsedUpDescriptors {
+public:
+  explicit UsedUpDescriptors(int spare) {
+    rlimit limit{};
+    ::getrlimit(RLIMIT_NOFILE, &limit);
+    limit.rlim_cur = 256;
+    ::setrlimit(RLIMIT_NOFILE, &limit);
+    for (int one = ::open("/dev/null", O_RDONLY); one >= 0; one = ::open("/dev/null", O_RDONLY)) {
+      m_descriptors.push_back(one);
+    }
+    for (int i = 0; i < spare; ++i) {
+      ::close(m_descriptors.back());
+      m_descriptors.pop_back();
+    }
+  }
+  UsedUpDescriptors(const UsedUpDescriptors &) = delete;
+  UsedUpDescriptors &operator=(const UsedUpDescriptors &) = delete;
+  ~UsedUpDescriptors() {
+    for (const int one : m_descriptors) {
+      ::close(one);
+    }
+  }
+
+private:
+  std::vector<int> m_descriptors;
+};
+
+PostingServer AnsweringServer() {
+  return PostingServer(std::vector<std::string>(10, IssueResponse(ReadDataFile("tokens/bearer.xml"))));
+}
+
+void Report(const ServicePtr &service) {
+  std::cerr << Acquire(service) << "\n" << AcquireAsynchronously(service) << "\n";
+}
+
+[[noreturn]] void ReportFirstUse(int spare) {
+  const PostingServer server = AnsweringServer();
+  const ServicePtr service = ServiceAt(server.GetUrl());
+  {
+    const UsedUpDescriptors used(spare);
+    Report(service);
+  }
+  Report(service);
+  std::_Exit(0);
+}
+
+TEST(NoDescriptorDeathTest, FailsTheFirstUseOfTheNetworkAndNoLaterOne) {
+  testing::FLAGS_gtest_death_test_style = "threadsafe";
+  const std::string expected = "Tarvel::InvalidStateException: Cannot wait for the network: Too many open files\n"
+                               "Tarvel::InvalidStateException: Cannot wait for the network: Too many open files\n"
+                               "{Name: alice; Domain:corp.example}\n"
+                               "{Name: alice; Domain:corp.example}\n";
+  for (const int spare : {0, 1}) {
+    EXPECT_EXIT(ReportFirstUse(spare), testing::ExitedWithCode(0), testing::Eq(expected)) << spare;
+  }
+}
+
+[[noreturn]] void ReportLaterUse() {
+  const PostingServer server = AnsweringServer();
+  const ServicePtr service = ServiceAt(server.GetUrl());
+  const ServicePtr address = ServiceAt("http://127.0.0.1:80/");
+  const ServicePtr knownName = ServiceAt("http://localhost:80/");
+  const ServicePtr unknownName = ServiceAt("http://no-such-host.invalid:80/");
+  Report(service);
+  {
+    const UsedUpDescriptors used(0);
+    Report(address);
+    Report(knownName);
+    Report(unknownName);
+  }
+  Report(service);
+  std::_Exit(0);
+}
+
+TEST(NoDescriptorDeathTest, IsTheReasonThatALaterUseReports) {
+  testing::FLAGS_gtest_death_test_style = "threadsafe";
+  const std::string alice = "{Name: alice; Domain:corp.example}\n";
+  std::string expected = alice + alice;
+  for (const std::string host : {"127.0.0.1", "localhost", "no-such-host.invalid"}) {
+    for (int i = 0; i < 2; ++i) {
+      expected += "SsoClient::CommunicationException: Cannot connect to " + host + ":80: Too many open files\n";
+    }
+  }
+  EXPECT_EXIT(ReportLaterUse(), testing::ExitedWithCode(0), testing::Eq(expected + alice + alice));
+}
+
+} // namespace
+} // namespace Testing

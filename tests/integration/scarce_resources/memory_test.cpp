@@ -1,0 +1,296 @@
+// SPDX-License-Identifier: Apache-2.0
+// Memory that runs out at each place in turn: a completion is called once all the same, unless the start has thrown.
+#include "support/completion.h"
+#include "support/process_resources.h"
+#include "support/scripted_server.h"
+#include "system/name_lookup.h"
+
+#include <tarvel/system/stream.h>
+
+#include <gtest/gtest.h>
+
+#include <array>
+#include <atomic>
+#include <cstdio>
+#include <cstdlib>
+#include <cstring>
+#include <functional>
+#include <new>
+#include <set>
+#include <string>
+#include <sys/prctl.h>
+#include <vector>
+
+namespace {
+
+enum class Shortage { NONE, OF_ONE_PIECE, FROM_ONE_PIECE_ON };
+
+std::atomic<Shortage> g_shortage{Shortage::NONE};
+std::atomic<int> g_piecesLeft{0};
+std::atomic<int> g_refused{0};
+thread_local bool isInStart = false;
+
+/// Whether the calling thread is one of the platform's, or in a call of the test that starts an operation.
+bool IsConcerned() noexcept {
+  thread_local const bool isOfPlatform = [] {
+    std::array<char, 16> name{};
+    ::prctl(PR_GET_NAME, name.data());
+    return std::strncmp(name.data(), "tarvel-", 7) == 0;
+  }();
+  return isOfPlatform || isInStart;
+}
+
+bool IsRefused() noexcept {
+  const Shortage shortage = g_shortage;
+  if (shortage == Shortage::NONE || !IsConcerned()) {
+    return false;
+  }
+  const int left = g_piecesLeft--;
+  const bool isRefused = shortage == Shortage::OF_ONE_PIECE ? left == 0 : left <= 0;
+  g_refused += isRefused;
+  return isRefused;
+}
+
+void *Allocate(std::size_t size) {
+  void *const piece = IsRefused() ? nullptr : std::malloc(size);
+  if (!piece) {
+    throw std::bad_alloc();
+  }
+  return piece;
+}
+
+} // namespace
+
+void *operator new(std::size_t size) {
+  return Allocate(size);
+}
+
+void *operator new[](std::size_t size) {
+  return Allocate(size);
+}
+
+void operator delete(void *piece) noexcept {
+  std::free(piece);
+}
+
+void operator delete(void *piece, std::size_t) noexcept {
+  std::free(piece);
+}
+
+void operator delete[](void *piece) noexcept {
+  std::free(piece);
+}
+
+void operator delete[](void *piece, std::size_t) noexcept {
+  std::free(piece);
+}
+
+// The linker calls this in place of the C library's function.
+extern "C" {
+void *__real_aligned_alloc(std::size_t alignment, std::size_t size);
+void *__wrap_aligned_alloc(std::size_t alignment, std::size_t size);
+void *__wrap_aligned_alloc(std::size_t alignment, std::size_t size) {
+  return IsRefused() ? nullptr : __real_aligned_alloc(alignment, size);
+}
+}
+
+namespace Testing {
+namespace {
+
+using Tarvel::Exception;
+using Tarvel::Ref;
+using Tarvel::System::CreateTcpClientSocket;
+using Tarvel::System::TcpClientSocket;
+
+constexpr int MAX_PIECES = 1000;
+
+/// The one call of a completion, noted without any memory.
+class Note {
+public:
+  auto ForEnd() {
+    return [this](const Exception *failure) { Write(failure); };
+  }
+  auto ForTransfer() {
+    return [this](std::size_t, const Exception *failure) { Write(failure); };
+  }
+
+  int CountCalls() const { return m_calls; }
+  bool Wait() const {
+    return Eventually([this] { return m_calls > 0; });
+  }
+  /// What the completion was called with: "" for no failure.
+  std::string GetMessage() const { return m_message.data(); }
+
+private:
+  void Write(const Exception *failure) noexcept {
+    if (failure) {
+      std::snprintf(m_message.data(), m_message.size(), "%s", failure->what());
+    }
+    ++m_calls;
+  }
+
+  std::array<char, 256> m_message{};
+  std::atomic<int> m_calls{0};
+};
+
+/// Calls `start` while piece number `pieces` of the memory that is asked for, counted from 0, is refused; the platform's
+/// threads go on in that way. Whether it threw.
+bool StartShortOfMemory(Shortage shortage, int pieces, const std::function<void()> &start) {
+  g_piecesLeft = pieces;
+  g_refused = 0;
+  g_shortage = shortage;
+  isInStart = true;
+  bool hasThrown = false;
+  try {
+    start();
+  } catch (const std::bad_alloc &) {
+    hasThrown = true;
+  }
+  isInStart = false;
+  return hasThrown;
+}
+
+int EndShortage() {
+  g_shortage = Shortage::NONE;
+  return g_refused;
+}
+
+struct Attempt {
+  std::function<void(TcpClientSocket &)> prepare; ///< with memory
+  std::function<void(TcpClientSocket &, Note &)> start;
+  std::function<void(TcpClientSocket &)> end; ///< without
+};
+
+/// Makes the attempt with each piece of memory refused in turn. The messages with which it failed.
+std::set<std::string> FailAtEachPiece(Shortage shortage, const Attempt &attempt) {
+  std::set<std::string> messages;
+  EXPECT_TRUE(DrainIoThreads());
+  for (int pieces = 0; pieces < MAX_PIECES; ++pieces) {
+    const Ref<TcpClientSocket> socket = CreateTcpClientSocket();
+    attempt.prepare(*socket);
+    Note note;
+    const bool hasThrown = StartShortOfMemory(shortage, pieces, [&] { attempt.start(*socket, note); });
+    attempt.end(*socket);
+    EXPECT_TRUE(hasThrown || note.Wait()) << "piece " << pieces;
+    const int refused = EndShortage();
+    socket->Close();
+    EXPECT_TRUE(DrainIoThreads());
+    EXPECT_EQ(note.CountCalls(), hasThrown ? 0 : 1) << "piece " << pieces;
+    messages.insert(hasThrown ? "(thrown)" : note.GetMessage());
+    if (refused == 0) {
+      return messages;
+    }
+  }
+  ADD_FAILURE() << "there is no end of the memory that is asked for";
+  return messages;
+}
+
+void DoNothing(TcpClientSocket &) {}
+
+std::string Target(const std::string &host, int port) {
+  return "Cannot connect to " + host + ":" + std::to_string(port) + ": ";
+}
+
+class WithoutMemory : public testing::TestWithParam<Shortage> {
+protected:
+  void SetUp() override { CreateTcpClientSocket(); } // starts the I/O threads
+};
+
+TEST_P(WithoutMemory, AConnectToAnAddressIsCompletedOnce) {
+  ScriptedServer server([](ServerConnection &peer) { peer.Stall(); });
+  const int port = server.GetPort();
+  const std::string host = "127.0.0.1";
+  const std::set<std::string> messages = FailAtEachPiece(
+      GetParam(),
+      {DoNothing, [&](TcpClientSocket &socket, Note &note) { socket.AsyncConnect(host, port, note.ForEnd()); },
+       DoNothing});
+  for (const std::string &message : messages) {
+    EXPECT_TRUE(message.empty() || message == "(thrown)" || message == Target(host, port) + "out of memory" ||
+                message == "Out of memory")
+        << message;
+  }
+  EXPECT_EQ(messages.count(""), 1u);
+  EXPECT_GE(messages.size(), 3u);
+}
+
+TEST_P(WithoutMemory, AConnectToANameIsCompletedOnce) {
+  ScriptedServer server([](ServerConnection &peer) { peer.Stall(); });
+  const int port = server.GetPort();
+  const std::string host = "a-name-that-is-longer-than-a-short-text.example";
+  const Tarvel::System::ScopedNameLookup lookup([](const std::string &) {
+    return Tarvel::System::AddressList{boost::asio::ip::make_address("::1"),
+                                       boost::asio::ip::make_address("127.0.0.1")};
+  });
+  const std::set<std::string> messages = FailAtEachPiece(
+      GetParam(),
+      {DoNothing, [&](TcpClientSocket &socket, Note &note) { socket.AsyncConnect(host, port, note.ForEnd()); },
+       DoNothing});
+  for (const std::string &message : messages) {
+    EXPECT_TRUE(message.empty() || message == "(thrown)" || message == Target(host, port) + "out of memory" ||
+                message == "Out of memory")
+        << message;
+  }
+  EXPECT_EQ(messages.count(""), 1u);
+  EXPECT_GE(messages.size(), 3u);
+}
+
+TEST_P(WithoutMemory, AConnectThatIsClosedIsCompletedOnce) {
+  const FullPort full;
+  const std::string host = "127.0.0.1";
+  const std::set<std::string> messages =
+      FailAtEachPiece(GetParam(), {DoNothing,
+                                   [&](TcpClientSocket &socket, Note &note) {
+                                     isInStart = false;
+                                     socket.AsyncConnect(host, full.GetPort(), note.ForEnd());
+                                     isInStart = true;
+                                     socket.Close();
+                                   },
+                                   DoNothing});
+  EXPECT_EQ(messages, (std::set<std::string>{"Out of memory", Target(host, full.GetPort()) + "cancelled"}));
+}
+
+void Connect(TcpClientSocket &socket, int port) {
+  Note connected;
+  socket.AsyncConnect("127.0.0.1", port, connected.ForEnd());
+  ASSERT_TRUE(connected.Wait());
+  ASSERT_EQ(connected.GetMessage(), "");
+}
+
+TEST_P(WithoutMemory, AReadIsCompletedOnce) {
+  ScriptedServer server([](ServerConnection &peer) { peer.Stall(); });
+  char byte = 0;
+  const std::set<std::string> messages = FailAtEachPiece(
+      GetParam(), {[&](TcpClientSocket &socket) { Connect(socket, server.GetPort()); },
+                   [&](TcpClientSocket &socket, Note &note) { socket.AsyncReadSome(&byte, 1, note.ForTransfer()); },
+                   [](TcpClientSocket &socket) { socket.Close(); }});
+  const std::string closed =
+      "The connection to 127.0.0.1:" + std::to_string(server.GetPort()) + " was closed by this side";
+  EXPECT_EQ(messages, (std::set<std::string>{"(thrown)", "Out of memory", closed}));
+}
+
+TEST_P(WithoutMemory, AWriteInSeveralPartsIsCompletedOnce) {
+  constexpr std::size_t LENGTH = 8u << 20; // more than the system takes at once
+  ScriptedServer server([](ServerConnection &peer) { peer.ReadExactly(LENGTH); });
+  const std::string message(LENGTH, 'x');
+  const std::set<std::string> messages =
+      FailAtEachPiece(GetParam(), {[&](TcpClientSocket &socket) { Connect(socket, server.GetPort()); },
+                                   [&](TcpClientSocket &socket, Note &note) {
+                                     socket.AsyncWrite(message.data(), message.size(), note.ForTransfer());
+                                   },
+                                   DoNothing});
+  const std::string broken =
+      "The connection to 127.0.0.1:" + std::to_string(server.GetPort()) + " broke: Cannot allocate memory";
+  for (const std::string &one : messages) {
+    EXPECT_TRUE(one.empty() || one == "(thrown)" || one == broken || one == "Out of memory") << one;
+  }
+  EXPECT_EQ(messages.count(""), 1u);
+  EXPECT_EQ(messages.count("(thrown)"), 1u);
+}
+
+INSTANTIATE_TEST_SUITE_P(Shortages, WithoutMemory, testing::Values(Shortage::OF_ONE_PIECE, Shortage::FROM_ONE_PIECE_ON),
+                         [](const testing::TestParamInfo<Shortage> &shortage) {
+                           return shortage.param == Shortage::OF_ONE_PIECE ? "OfOnePiece" : "FromOnePieceOn";
+                         });
+
+} // namespace
+} // namespace Testing
