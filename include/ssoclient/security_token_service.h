@@ -32,6 +32,8 @@ namespace SsoClient {
 /// - `Tarvel::InvalidArgumentException` for a lifetime that is not positive, for a text that XML cannot carry, for a
 ///   confirmation other than the default where a token is acquired by certificate, and for a bearer token to renew,
 ///   `Tarvel::InvalidStateException` where a holder-of-key identity is needed and none is configured,
+/// - `Tarvel::InvalidStateException` where the process uses the network for the first time and has no thread or descriptor
+///   left to wait for it; a later call tries again,
 /// - `Tarvel::Xml::Security::XmlSecurityException` for an identity whose key cannot sign with RSA-SHA256 (an EC key),
 /// - `Tarvel::Xml::Security::XmlSecurityException` or `Tarvel::Xml::XMLParseException` for an assertion in the response
 ///   that cannot be taken out of it as a document of its own.
@@ -75,22 +77,40 @@ public:
   // exactly once, on a pool's thread, maybe before the call has returned. What it throws is logged by the pool, and so is,
   // without a completion, anything thrown that is no `Tarvel::Exception` (memory that ran out, a handler's own class).
   // A null token or handler is reported as `Tarvel::InvalidArgumentException`.
+  //
+  // A completion must not wait for another asynchronous operation: the pool has at most 256 threads, and when a completion
+  // waits on each of them, what they wait for never starts. Start the next operation from the completion instead, and
+  // return; or call the operation without "Async" there, which is fine.
+  //
+  // Each of them throws `Tarvel::InvalidStateException` when the pool has no thread and none can be started, and then calls
+  // no completion.
 
+  /// `AcquireToken` on a thread of the pool. `completion` is not called when anything is thrown that is no
+  /// `Tarvel::Exception`, and must not wait for another asynchronous operation.
   virtual void AcquireTokenAsync(const std::string &username, const std::string &password, const TokenSpec &spec,
                                  const TokenCompletion &completion) const = 0;
 
-  /// The handler is called on the pool's thread.
+  /// `AcquireTokenByGSS` on a thread of the pool, on which the handler is called. `completion` is not called when anything
+  /// is thrown that is no `Tarvel::Exception`, by the handler, too; it must not wait for another asynchronous operation.
   virtual void AcquireTokenByGssAsync(const TokenSpec &spec, const std::shared_ptr<NegotiationHandler> &handler,
                                       const TokenCompletion &completion) const = 0;
 
+  /// `AcquireTokenByCertificate` on a thread of the pool. `completion` is not called when anything is thrown that is no
+  /// `Tarvel::Exception`, and must not wait for another asynchronous operation.
   virtual void AcquireTokenByCertificateAsync(const TokenSpec &spec, const TokenCompletion &completion) const = 0;
 
+  /// `AcquireTokenByToken` on a thread of the pool. `completion` is not called when anything is thrown that is no
+  /// `Tarvel::Exception`, and must not wait for another asynchronous operation.
   virtual void AcquireTokenByTokenAsync(const std::shared_ptr<const SamlToken> &token, const TokenSpec &spec,
                                         const TokenCompletion &completion) const = 0;
 
+  /// `ValidateSubject` on a thread of the pool. `completion` is not called when anything is thrown that is no
+  /// `Tarvel::Exception`, and must not wait for another asynchronous operation.
   virtual void ValidateSubjectAsync(const std::shared_ptr<const SamlToken> &token,
                                     const ValidityCompletion &completion) const = 0;
 
+  /// `RenewToken` on a thread of the pool. `completion` is not called when anything is thrown that is no
+  /// `Tarvel::Exception`, and must not wait for another asynchronous operation.
   virtual void RenewTokenAsync(const std::shared_ptr<const SamlToken> &token, std::int64_t lifetimeSec,
                                const TokenCompletion &completion) const = 0;
 

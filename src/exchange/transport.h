@@ -33,7 +33,8 @@ public:
   /// @throws CommunicationException when the transport fails.
   virtual void SendRequest(const Request &request, Tarvel::Ref<Tarvel::Reader> &response) = 0;
 
-  /// Posts the request without waiting; `item` is the work that is under way. `completion` runs on a platform thread.
+  /// Posts the request without waiting; `item` is the work that is under way. `completion` runs on an I/O
+  /// thread, where it must not block, nor wait for another request.
   virtual void SendRequestAsync(const Request &request, const Completion &completion,
                                 Tarvel::Ref<Tarvel::System::ScheduledItem> &item) = 0;
 

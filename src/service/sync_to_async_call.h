@@ -50,7 +50,7 @@ void SyncCallToResultFunc(const Call &call, const Callback &callback, const Fail
 
 /// Queues `SyncCallToResultFunc` of copies of the three on the platform's thread pool and returns at once. The copies are
 /// destroyed when the work has run.
-/// @throws std::system_error when the pool has no thread and can start none.
+/// @throws Tarvel::InvalidStateException when the pool has no thread and can start none; nothing is called then.
 template <typename Call, typename Callback, typename FailureValue>
 void SyncToAsyncCall(const Call &call, const Callback &callback, const FailureValue &failureValue) {
   Tarvel::System::GetThreadPool()->QueueWorkItem(

@@ -28,6 +28,7 @@ struct TlsLayer {
   std::string endpoint; // under which the session is remembered
   Ref<SSLContext> context;
   std::string parameter;
+  Tarvel::System::NetworkException outOfMemory{"Out of memory"}; // made while there is memory
 };
 
 void StartHandshake(const TlsLayer &layer, const Ref<Stream> &socket,
@@ -40,7 +41,7 @@ void StartHandshake(const TlsLayer &layer, const Ref<Stream> &socket,
                          [completion, stream](const Exception *failure) { completion(stream, failure); });
 }
 
-/// On an I/O thread: an exception that got away would leave the one who waits for the completion without an answer.
+/// On an I/O thread: whoever waits for the completion would get no answer if an exception left this.
 void OnSocketConnected(const TlsLayer &layer, const Ref<Stream> &socket, const Exception *failure,
                        const ConnectionSpec::ConnectCompletion &completion) {
   if (failure) {
@@ -51,9 +52,8 @@ void OnSocketConnected(const TlsLayer &layer, const Ref<Stream> &socket, const E
     StartHandshake(layer, socket, completion);
   } catch (const Exception &exception) {
     completion(socket, &exception);
-  } catch (const std::exception &exception) {
-    const Tarvel::System::NetworkException failureOfOurs(exception.what());
-    completion(socket, &failureOfOurs);
+  } catch (...) {
+    completion(socket, &layer.outOfMemory); // the platform throws nothing else that is not its own
   }
 }
 
@@ -81,10 +81,11 @@ bool SsoCustomConnectionSpecImpl::IsReuseOnAuthErrorSupported() const {
 
 Ref<ScheduledItem> SsoCustomConnectionSpecImpl::AsyncConnect(ConnectCompletion completion) const {
   const Ref<TcpClientSocket> socket = Tarvel::System::CreateTcpClientSocket();
+  Ref<ScheduledItem> canceller = Tarvel::System::CreateStreamCanceller(socket); // nothing may fail after the start
   socket->AsyncConnect(
       GetConnectionTargetHost(), m_port,
       [socket, completion = std::move(completion)](const Exception *failure) { completion(socket, failure); });
-  return Tarvel::System::CreateStreamCanceller(socket);
+  return canceller;
 }
 
 std::string SsoCustomConnectionSpecImpl::GetConnectionTargetHost() const {

@@ -1,20 +1,51 @@
 // SPDX-License-Identifier: Apache-2.0
-// No descriptor left. Each test is a process of its own, whose first use of the network this is.
+// No descriptor left. Each death test is a process of its own, whose first use of the network this is.
 #include "outcome.h"
 
 #include "support/data_file.h"
 #include "support/posting_server.h"
 #include "support/soap_responses.h"
+#include "system/name_lookup.h"
+
+#include <tarvel/system/stream.h>
 
 #include <gtest/gtest.h>
 
+#include <cerrno>
 #include <cstdlib>
 #include <fcntl.h>
 #include <iostream>
+#include <netdb.h>
+#include <optional>
 #include <string>
 #include <sys/resource.h>
 #include <unistd.h>
 #include <vector>
+
+namespace {
+
+/// How the resolver is to fail, and what it leaves in errno.
+struct ResolverFailure {
+  int code;
+  int error;
+};
+
+std::optional<ResolverFailure> g_resolverFailure;
+
+} // namespace
+
+// The linker calls this in place of the C library's function.
+extern "C" {
+int __real_getaddrinfo(const char *name, const char *service, const addrinfo *hints, addrinfo **list);
+int __wrap_getaddrinfo(const char *name, const char *service, const addrinfo *hints, addrinfo **list);
+int __wrap_getaddrinfo(const char *name, const char *service, const addrinfo *hints, addrinfo **list) {
+  if (g_resolverFailure) {
+    errno = g_resolverFailure->error;
+    return g_resolverFailure->code;
+  }
+  return __real_getaddrinfo(name, service, hints, list);
+}
+}
 
 namespace Testing {
 namespace {
@@ -23,9 +54,8 @@ namespace {
 class UsedUpDescriptors {
 public:
   explicit UsedUpDescriptors(int spare) {
-    rlimit limit{};
-    ::getrlimit(RLIMIT_NOFILE, &limit);
-    limit.rlim_cur = 256;
+    ::getrlimit(RLIMIT_NOFILE, &m_earlier);
+    const rlimit limit{256, m_earlier.rlim_max};
     ::setrlimit(RLIMIT_NOFILE, &limit);
     for (int one = ::open("/dev/null", O_RDONLY); one >= 0; one = ::open("/dev/null", O_RDONLY)) {
       m_descriptors.push_back(one);
@@ -41,9 +71,11 @@ public:
     for (const int one : m_descriptors) {
       ::close(one);
     }
+    ::setrlimit(RLIMIT_NOFILE, &m_earlier);
   }
 
 private:
+  rlimit m_earlier{};
   std::vector<int> m_descriptors;
 };
 
@@ -104,6 +136,36 @@ TEST(NoDescriptorDeathTest, IsTheReasonThatALaterUseReports) {
     }
   }
   EXPECT_EXIT(ReportLaterUse(), testing::ExitedWithCode(0), testing::Eq(expected + alice + alice));
+}
+
+/// The reason for which a look-up fails when the resolver does.
+std::string LookUp(const ResolverFailure &failure) {
+  g_resolverFailure = failure;
+  std::string reason = "(found)";
+  try {
+    Tarvel::System::LookUpName("sts.example");
+  } catch (const Tarvel::System::NetworkException &exception) {
+    reason = exception.what();
+  }
+  g_resolverFailure.reset();
+  return reason;
+}
+
+TEST(LookUpName, ReportsTheResolversReason) {
+  EXPECT_EQ(LookUp({EAI_NONAME, ENOENT}), "Name or service not known");
+  EXPECT_EQ(LookUp({EAI_AGAIN, 0}), "Temporary failure in name resolution");
+  EXPECT_EQ(LookUp({EAI_SYSTEM, EIO}), "Input/output error");
+}
+
+TEST(LookUpName, ReportsALackOfDescriptorsThatTheResolverMetAndHides) {
+  EXPECT_EQ(LookUp({EAI_NONAME, EMFILE}), "Too many open files");
+  EXPECT_EQ(LookUp({EAI_AGAIN, ENFILE}), "Too many open files in system");
+}
+
+TEST(LookUpName, ReportsALackOfDescriptorsThatTheResolverLeavesNoTraceOf) {
+  const UsedUpDescriptors used(0);
+  EXPECT_EQ(LookUp({EAI_NONAME, 0}), "Too many open files");
+  EXPECT_EQ(LookUp({EAI_AGAIN, ENOENT}), "Too many open files");
 }
 
 } // namespace

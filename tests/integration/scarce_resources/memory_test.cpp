@@ -5,6 +5,8 @@
 #include "support/scripted_server.h"
 #include "system/name_lookup.h"
 
+#include <ssoclient/connection_spec.h>
+#include <tarvel/http/connection_spec.h>
 #include <tarvel/system/stream.h>
 
 #include <gtest/gtest.h>
@@ -19,6 +21,7 @@
 #include <set>
 #include <string>
 #include <sys/prctl.h>
+#include <utility>
 #include <vector>
 
 namespace {
@@ -232,6 +235,33 @@ TEST_P(WithoutMemory, AConnectToANameIsCompletedOnce) {
   }
   EXPECT_EQ(messages.count(""), 1u);
   EXPECT_GE(messages.size(), 3u);
+}
+
+TEST_P(WithoutMemory, AConnectOfAConnectionSpecIsCompletedOnce) {
+  ScriptedServer server([](ServerConnection &peer) { peer.Stall(); });
+  Ref<Tarvel::Http::ConnectionSpec> plain;
+  Ref<Tarvel::Http::ConnectionSpec> withoutContext;
+  SsoClient::CreateSsoConnectionSpec("127.0.0.1", server.GetPort(), false, plain);
+  SsoClient::CreateSsoSSLConnectionSpec("127.0.0.1", server.GetPort(), nullptr, "", false, withoutContext);
+  const std::string target = Target("127.0.0.1", server.GetPort());
+  const std::string refusal = "Invalid argument : an SSL connection needs an SSLContext.";
+  for (const auto &[spec, outcome] : {std::pair(plain, std::string()), std::pair(withoutContext, refusal)}) {
+    const std::set<std::string> messages = FailAtEachPiece(
+        GetParam(), {DoNothing,
+                     [&spec = spec](TcpClientSocket &, Note &note) {
+                       spec->AsyncConnect([&note](const Ref<Tarvel::System::Stream> &, const Exception *failure) {
+                         note.ForEnd()(failure);
+                       });
+                     },
+                     DoNothing});
+    for (const std::string &message : messages) {
+      EXPECT_TRUE(message == outcome || message == "(thrown)" || message == target + "out of memory" ||
+                  message == "Out of memory")
+          << message;
+    }
+    EXPECT_EQ(messages.count(outcome), 1u);
+    EXPECT_EQ(messages.count("(thrown)"), 1u);
+  }
 }
 
 TEST_P(WithoutMemory, AConnectThatIsClosedIsCompletedOnce) {

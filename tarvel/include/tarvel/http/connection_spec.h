@@ -19,7 +19,8 @@ namespace Http {
 /// Opens connections to one endpoint. Immutable; safe on any thread.
 class TARVEL_API ConnectionSpec : public Object {
 public:
-  /// Called once, on an I/O thread, with the stream and null, or with an exception; the stream may be given then too.
+  /// Called once, on an I/O thread, with the stream and null, or with an exception; the stream may be given then too. It
+  /// must not block, nor wait for another operation: start the next one from it.
   using ConnectCompletion = std::function<void(const Ref<System::Stream> &, const Exception *)>;
 
   /// One line for logs. The platform does not read it.
@@ -37,6 +38,8 @@ public:
 
   /// Starts to connect. The returned item cancels the attempt; the completion then gets an exception. What goes wrong
   /// is for the completion, as a rule in a `System::NetworkException`, of which `Ssl::SSLException` is one.
+  /// @throws InvalidStateException when there is no I/O thread that could call the completion, and none can be started;
+  ///         `std::bad_alloc`. The completion is not called then.
   virtual Ref<System::ScheduledItem> AsyncConnect(ConnectCompletion completion) const = 0;
 
 protected:

@@ -76,7 +76,9 @@ class TARVEL_API UserAgent : public Object {
 public:
   /// Called exactly once for each start, on an I/O thread: with null and the whole response, or with an exception and
   /// null. The exception is valid during the call. The item is the one that `StartRequest` hands out. An exception that
-  /// leaves the function is logged and goes no further.
+  /// leaves the function is logged and goes no further. The function must not block, nor wait for another request: the
+  /// thread is one of two, on which that request would have to complete. Start the next one from here, and queue work that
+  /// takes time on a thread pool.
   using CompletionFunction =
       std::function<void(const Exception *, const Ref<ClientResponse> &, const Ref<PendingRequestItem> &)>;
 

@@ -26,7 +26,8 @@ class TARVEL_API SSLException : public System::NetworkException {
 class TARVEL_API SSLStream : public System::Stream {
 public:
   /// Called once, on an I/O thread, with null or with what went wrong, which is valid during the call: an
-  /// `SSLException`, also when the stream below failed, or an `InvalidStateException` for a second handshake.
+  /// `SSLException`, also when the stream below failed, or an `InvalidStateException` for a second handshake. As any
+  /// completion of a stream, it must not block, nor wait for another operation: start the next one from it.
   using HandshakeHandler = std::function<void(const Exception *)>;
 
   /// Shakes hands as a client. `host` is sent as the server name (unless it is an address) and the server's certificate

@@ -27,14 +27,20 @@ class TARVEL_API TimeoutException : public NetworkException {
   TARVEL_EXCEPTION_BODY(TimeoutException, NetworkException);
 };
 
-/// A connected stream of bytes, driven asynchronously. Completions run on the platform's I/O threads, exactly once for
-/// each start, never inside the starting call (though perhaps before it has returned). At most one read and one write
-/// may be pending at a time. Buffers belong to the caller and must stay until the completion. Any thread may start and
-/// close.
+/// A connected stream of bytes, driven asynchronously. A completion is called exactly once for each start that returns,
+/// whatever goes wrong, and never inside the starting call (though perhaps before it has returned). A start throws
+/// `std::bad_alloc` when there is no memory to begin with, and nothing else; its completion is not called then.
+///
+/// Completions run on the platform's I/O threads, of which all that is pending in the process shares two. They must not
+/// block, nor wait for another operation, synchronous or asynchronous: start the next one from the completion, and queue
+/// work that takes time on a thread pool. What a completion throws is logged (logger "Tarvel", level 8) and goes no further.
+///
+/// At most one read and one write may be pending at a time. Buffers belong to the caller and must stay until the
+/// completion. Any thread may start and close.
 class TARVEL_API Stream : public Object {
 public:
   /// Called with the number of bytes moved and null, or with what went wrong, which is valid during the call: a
-  /// `NetworkException`, over TLS its `Ssl::SSLException`; `InvalidArgumentException` or `InvalidStateException` for a
+  /// `NetworkException` (also when memory runs out on the way), over TLS its `Ssl::SSLException`; `InvalidArgumentException` or `InvalidStateException` for a
   /// read of no bytes and, over TLS, for a second read or write while one is pending and for one before the handshake.
   using TransferHandler = std::function<void(std::size_t, const Exception *)>;
 
@@ -59,13 +65,15 @@ constexpr std::size_t MAX_NAME_LOOKUPS = 64;
 /// A TCP connection to be made.
 class TARVEL_API TcpClientSocket : public Stream {
 public:
-  /// Called with null, or with what went wrong, which is valid during the call: a `NetworkException`, or an
-  /// `InvalidStateException` for a socket that has been used or closed already.
+  /// Called with null, or with what went wrong, which is valid during the call: a `NetworkException` (also when no
+  /// descriptor, thread or memory is left), or an `InvalidStateException` for a socket that has been used or closed already.
   using ConnectHandler = std::function<void(const Exception *)>;
 
   /// Resolves `host` (a name, or an IPv4 or IPv6 address, this one with or without brackets) and connects, trying each
   /// address in the resolver's order until one answers. Names that are not ASCII are refused, and ports outside 1 to
-  /// 65535, by a `NetworkException` to the handler.
+  /// 65535, by a `NetworkException` to the handler. A look-up of the name that is under way is joined; when
+  /// `MAX_NAME_LOOKUPS` other names are being looked up, it waits for its turn. `Close` ends the wait, not the look-up.
+  /// No result is kept for later connections.
   virtual void AsyncConnect(const std::string &host, int port, ConnectHandler handler) = 0;
 
 protected:
@@ -73,7 +81,8 @@ protected:
 };
 
 /// A socket, not connected. Its completions run on the platform's I/O threads.
-/// @throws InvalidStateException when these cannot be started.
+/// @throws InvalidStateException when these cannot be started, or no descriptor is left for what they wait on. Only the
+///         first sockets of a process can meet that; a later call tries again.
 TARVEL_API Ref<TcpClientSocket> CreateTcpClientSocket();
 
 /// A handle that cancels by closing `stream`.

@@ -23,6 +23,10 @@ public:
   /// Queues `work` for one run and returns at once. Items start in the order in which they are queued. An exception
   /// that leaves `work` is logged (logger "Tarvel", level 8) and ends that item only. `work` and what it holds are
   /// destroyed on the pool's thread after the run, or wherever a cancelled item is taken out of the queue.
+  ///
+  /// `work` must not wait for another item of the pool: when as many items wait as the pool may have threads, none that
+  /// they wait for ever starts. Let the last piece of work queue what comes next.
+  /// @throws InvalidStateException when the pool has no thread and none can be started; `work` is then never run.
   virtual Ref<ScheduledItem> QueueWorkItem(std::function<void()> work) = 0;
 
   virtual std::size_t GetThreadCeiling() const noexcept = 0;
