@@ -29,7 +29,7 @@ public:
   HttpExchange(const Ref<ConnectionSpec> &spec, const Ref<CookieStore> &cookies, RequestData request,
                UserAgent::CompletionFunction completion);
 
-  /// Once.
+  /// Once. When it throws, nothing has been reported, and nothing will be.
   void Start();
 
   /// Waits, on this thread alone, until the completion function has run.
@@ -57,10 +57,12 @@ private:
 
   /// Runs one call of the reader, and says in its exception whose response it is about.
   void Judge(const std::function<void()> &call) const;
-  /// Runs one step of the road; what it throws is how the exchange ends.
-  void Step(const std::function<void()> &step);
-  void Fail(const Exception &failure) { Finish(&failure, nullptr); }
-  void Finish(const Exception *failure, const Ref<ClientResponse> &response);
+  /// Runs one step; whatever it throws is how the exchange ends.
+  template <typename Call>
+  void Step(const Call &step) noexcept;
+  std::shared_ptr<const Exception> Cancelled() const noexcept;
+  void Finish(std::shared_ptr<const Exception> failure, const Ref<ClientResponse> &response) noexcept;
+  bool Abandon() noexcept;
   void Complete(const UserAgent::CompletionFunction &completion, const Exception *failure,
                 const Ref<ClientResponse> &response) noexcept;
 
@@ -80,6 +82,7 @@ private:
   Ref<System::ScheduledItem> m_connecting;
   Ref<System::Stream> m_stream;
   UserAgent::CompletionFunction m_completion;
+  bool m_isConnectOver = false;
   bool m_isCancelled = false;
   bool m_isWriteOver = false;
   bool m_endWaitsForWrite = false;

@@ -77,8 +77,10 @@ protected:
 class TARVEL_API UserAgent : public Object {
 public:
   /// Called exactly once for each start, on an I/O thread: with null and the whole response, or with an exception and
-  /// null. The exception is valid during the call. The item is the one that `StartRequest` hands out. An exception that
-  /// leaves the function is logged and goes no further.
+  /// null, whatever went wrong: memory that ran out is an `OutOfMemoryException`, what another library or an
+  /// implementation of stream, specification or cookie store throws that is not a `Tarvel::Exception` is an
+  /// `InvalidStateException` with its text. The exception is valid during the call. The item is the one that
+  /// `StartRequest` hands out. An exception that leaves the function is logged and goes no further.
   using CompletionFunction =
       std::function<void(const Exception *, const Ref<ClientResponse> &, const Ref<PendingRequestItem> &)>;
 
