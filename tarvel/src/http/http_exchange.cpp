@@ -59,6 +59,7 @@ HttpExchange::HttpExchange(const Ref<ConnectionSpec> &spec, const Ref<CookieStor
 
 HttpExchange::~HttpExchange() {
   SecureWipe(m_message);
+  SecureWipe(m_buffer.data(), m_buffer.size());
 }
 
 void HttpExchange::Start() {

@@ -73,7 +73,7 @@ private:
   // For one step at a time, hence without a lock. The message stays until it is written; then it is wiped.
   RequestData m_request;
   std::string m_message;
-  std::array<char, BUFFER_BYTES> m_buffer;
+  std::array<char, BUFFER_BYTES> m_buffer; // as secret as the response
   ResponseReader m_reader;
   bool m_isSecure = false;
 

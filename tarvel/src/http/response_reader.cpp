@@ -2,6 +2,10 @@
 
 #include "http/response_reader.h"
 
+#include "core/wiped_growth.h"
+
+#include <tarvel/core/secure_wipe.h>
+
 #include <boost/asio/buffer.hpp>
 #include <boost/beast/http/basic_parser.hpp>
 #include <boost/beast/http/error.hpp>
@@ -151,10 +155,16 @@ private:
   bool m_knowsCodings = true;
 };
 
+ResponseData::~ResponseData() {
+  SecureWipe(body);
+}
+
 ResponseReader::ResponseReader(bool answersHead)
     : m_answersHead(answersHead), m_header(std::make_unique<ResponseHeaderParser>()) {}
 
-ResponseReader::~ResponseReader() = default;
+ResponseReader::~ResponseReader() {
+  SecureWipe(m_pendingHeader);
+}
 
 void ResponseReader::Put(std::string_view bytes) {
   while (!bytes.empty() && !IsComplete()) {
@@ -178,7 +188,7 @@ std::size_t ResponseReader::PutHeader(std::string_view bytes) {
   CheckHeaderLength(length);
   m_pendingHeader.resize(length);
   ParseHeader();
-  m_pendingHeader.clear();
+  SecureWipe(m_pendingHeader); // bytes of the body may have been behind it
   return length - known;
 }
 
@@ -258,11 +268,11 @@ std::size_t ResponseReader::PutBody(std::string_view bytes) {
   }
   if (m_stage == Stage::BODY_TO_END) {
     CheckBodyLength(body.size() + bytes.size());
-    body.append(bytes);
+    AppendWiping(body, bytes);
     return bytes.size();
   }
   const std::string_view data = bytes.substr(0, m_length - body.size());
-  body.append(data);
+  AppendWiping(body, data);
   if (body.size() == m_length) {
     m_stage = Stage::COMPLETE;
   }

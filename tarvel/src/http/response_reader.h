@@ -16,7 +16,15 @@
 
 namespace Tarvel::Http {
 
+/// Its body is secret.
 struct ResponseData {
+  ResponseData() = default;
+  ResponseData(const ResponseData &) = delete;
+  ResponseData &operator=(const ResponseData &) = delete;
+  ResponseData(ResponseData &&) noexcept = default;
+  ResponseData &operator=(ResponseData &&) noexcept = default; ///< onto one without a body, which is not wiped
+  ~ResponseData();
+
   int status = 0;
   std::string reason;
   HeaderFields fields; ///< of the header; a trailer's are dropped

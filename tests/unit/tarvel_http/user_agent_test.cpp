@@ -40,7 +40,13 @@ public:
 
   void AsyncWrite(const char *, std::size_t, TransferHandler handler) override {
     const std::lock_guard<std::mutex> lock(m_mutex);
+    ++m_writes;
     m_write = std::move(handler);
+  }
+
+  int GetWriteCount() {
+    const std::lock_guard<std::mutex> lock(m_mutex);
+    return m_writes;
   }
 
   void Close() noexcept override {
@@ -61,6 +67,7 @@ private:
   std::mutex m_mutex;
   std::string m_answer;
   TransferHandler m_write;
+  int m_writes = 0;
 };
 
 /// Hands out one stream; without one it throws.
@@ -367,6 +374,7 @@ TEST_F(UserAgentTest, EitherThrowsOrCallsTheCompletionFunctionOnceWhateverTheSpe
         EXPECT_FALSE(m_pending);
         spec->CallAgain();
         EXPECT_EQ(calls, 0);
+        EXPECT_EQ(stream->GetWriteCount(), 0);
         continue;
       }
       agent->StartRequest(Post(), count, m_pending);
@@ -377,6 +385,7 @@ TEST_F(UserAgentTest, EitherThrowsOrCallsTheCompletionFunctionOnceWhateverTheSpe
       }
       spec->CallAgain();
       EXPECT_EQ(calls, 1);
+      EXPECT_EQ(stream->GetWriteCount(), fails ? 0 : 1);
     }
   }
 }

@@ -44,7 +44,8 @@ protected:
   ~ClientRequest() override;
 };
 
-/// A whole response. As a reader it gives the body. With a status other than 2xx and 500, the header is all that was read:
+/// A whole response. As a reader it gives the body, which is wiped when the response is destroyed; what `ReadToEnd` hands
+/// out is the caller's to wipe. With a status other than 2xx and 500, the header is all that was read:
 /// the body is empty, and when the header states the body's length or coding in a wrong way, the headers from that one on
 /// are missing.
 class TARVEL_API ClientResponse : public Reader {

@@ -28,7 +28,7 @@ protected:
   ~Reader() override;
 };
 
-/// A reader over `text`, which it keeps.
+/// A reader over `text`, which it keeps, and overwrites when it is destroyed.
 TARVEL_API Ref<Reader> CreateStringReader(std::string text);
 
 } // namespace Tarvel
