@@ -163,6 +163,7 @@ ResponseReader::ResponseReader(bool answersHead)
     : m_answersHead(answersHead), m_header(std::make_unique<ResponseHeaderParser>()) {}
 
 ResponseReader::~ResponseReader() {
+  // Bytes of a body may have come with those of the header.
   SecureWipe(m_pendingHeader);
 }
 
@@ -188,7 +189,7 @@ std::size_t ResponseReader::PutHeader(std::string_view bytes) {
   CheckHeaderLength(length);
   m_pendingHeader.resize(length);
   ParseHeader();
-  SecureWipe(m_pendingHeader); // bytes of the body may have been behind it
+  m_pendingHeader.clear();
   return length - known;
 }
 
