@@ -56,6 +56,10 @@ std::string Reader::ReadToEnd(std::size_t maximumBytes) {
   return text;
 }
 
+std::string Reader::GetDeclaredCharset() const {
+  return {};
+}
+
 Ref<Reader> CreateStringReader(std::string text) {
   return MakeRef<StringReaderImpl>(std::move(text));
 }

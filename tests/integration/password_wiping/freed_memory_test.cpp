@@ -323,7 +323,9 @@ TEST_P(FreedMemory, HoldsNothingOfAResponse) {
     const std::size_t pieceLength = padding / 3 + 1000;
     for (const std::string &bytes :
          {ok + "Content-Length: " + std::to_string(body.size()) + "\r\n\r\n" + body, ok + "\r\n" + body,
-          ok + "Transfer-Encoding: chunked\r\n\r\n" + InChunks(body, 5000)}) {
+          ok + "Transfer-Encoding: chunked\r\n\r\n" + InChunks(body, 5000),
+          ok + "Content-Type: text/xml;charset=latin1\r\n\r\n<?xml version='1.0' encoding='latin1'?>" + body,
+          ok + "Content-Type: text/xml;charset=latin1\r\n\r\n" + body + "<!--\xFC-->"}) {
       const std::vector<std::string> pieces = InPieces(bytes, pieceLength);
       for (const Reading reading : {Reading::NOT, Reading::IN_PIECES, Reading::WHOLE, Reading::AS_XML}) {
         EXPECT_EQ(CountFindsOfAnswers(GetParam(), pieces, std::nullopt, reading), 0);

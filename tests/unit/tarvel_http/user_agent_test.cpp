@@ -139,6 +139,26 @@ TEST_F(UserAgentTest, HandsOutTheHeadersAndTheBodyInPieces) {
   EXPECT_EQ(m_response->Read(buffer, 3), 0u);
 }
 
+TEST_F(UserAgentTest, HandsOnABodyOfLatin1AsUtf8AndItsHeadersAsTheyCame) {
+  const auto agent = Create(MakeRef<AnsweringStream>("HTTP/1.1 200 OK\r\nContent-Type: text/xml;charset=iso-8859-1\r\n"
+                                                     "Content-Length: 1\r\n\r\n\xFC"));
+  agent->StartRequest(Post(), nullptr, m_pending);
+  agent->WaitForRequest(m_pending, LONG, m_response);
+  EXPECT_EQ(m_response->GetDeclaredCharset(), "iso-8859-1");
+  std::string value;
+  EXPECT_TRUE(m_response->GetHeader("Content-Type", value));
+  EXPECT_EQ(value, "text/xml;charset=iso-8859-1");
+  EXPECT_EQ(m_response->ReadToEnd(100), "\xC3\xBC");
+}
+
+TEST_F(UserAgentTest, HandsOnABodyWithoutCharsetAsItCame) {
+  const auto agent = Create(MakeRef<AnsweringStream>("HTTP/1.1 200 OK\r\nContent-Length: 1\r\n\r\n\xFC"));
+  agent->StartRequest(Post(), nullptr, m_pending);
+  agent->WaitForRequest(m_pending, LONG, m_response);
+  EXPECT_EQ(m_response->GetDeclaredCharset(), "");
+  EXPECT_EQ(m_response->ReadToEnd(100), "\xFC");
+}
+
 TEST_F(UserAgentTest, CallsTheCompletionFunctionOnceBeforeTheWaitReturns) {
   const auto agent = Create(MakeRef<AnsweringStream>("HTTP/1.1 200 OK\r\nContent-Length: 0\r\n\r\n"));
   int calls = 0;

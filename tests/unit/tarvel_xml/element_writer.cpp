@@ -61,6 +61,11 @@ std::string WriteInAscii(const ElementNode &element) {
   return writer->GetText();
 }
 
+TEST(WriteTo, WritesUtf8WhenNotAskedForReferences) {
+  const std::string text = "<a x=\"\xC3\xBC\">\xF0\x9F\x98\x80</a>";
+  EXPECT_EQ(WriteAgain(text), text);
+}
+
 TEST(WriteTo, WritesTextAndAttributeValuesAsReferencesWhenAskedTo) {
   const auto document = ParseDocument("<a x='\xC3\xBC&amp;\xC5\x82\t\xF0\x9F\x98\x80'>\x7F\xC2\x80&lt;\xE8\xAA\x9E"
                                       "\xEF\xBF\xBD\xF4\x8F\xBF\xBFz</a>");

@@ -48,6 +48,10 @@ protected:
 /// out is the caller's to wipe. With a status other than 2xx and 500, the header is all that was read:
 /// the body is empty, and when the header states the body's length or coding in a wrong way, the headers from that one on
 /// are missing.
+///
+/// A body is handed on as it came, with one exception: one that is declared as ISO-8859-1 by the charset of its media type,
+/// under any of the names that IANA lists, is handed on as UTF-8, unless it is UTF-8 and not ASCII already. An XML
+/// declaration in it that names ISO-8859-1 then names UTF-8. Such a body has at most twice the bytes of the one that came.
 class TARVEL_API ClientResponse : public Reader {
 public:
   virtual int GetStatusCode() const noexcept = 0;
