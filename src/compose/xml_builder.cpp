@@ -107,7 +107,7 @@ std::string SerializeToXML(const XMLBuilderPtr &builder) {
   ElementRef element;
   builder->build(element);
   const Tarvel::Ref<Tarvel::StringWriter> writer = Tarvel::CreateStringWriter();
-  element->WriteTo(*writer);
+  element->WriteTo(*writer, Tarvel::Xml::CharacterForm::REFERENCES);
   return writer->TakeText();
 }
 

@@ -80,7 +80,9 @@ void BuildAndAppendChildTo(Tarvel::Xml::ElementNode *parent, const XMLBuilderPtr
 /// Defines the attribute, a name and its value, on `element`.
 void ElementDefineAttribute(Tarvel::Xml::ElementNode *element, const XMLAttributes::value_type &attribute);
 
-/// Builds the tree and returns it as XML text, without an XML declaration.
+/// Builds the tree and returns it as XML text, without an XML declaration. Text and attribute values are ASCII, with
+/// references for all other characters: requests have no charset in their media type, so a service may take them for
+/// ISO-8859-1. Names, comments and processing instructions of a pre-built element stay UTF-8.
 std::string SerializeToXML(const XMLBuilderPtr &builder);
 
 } // namespace SsoClient

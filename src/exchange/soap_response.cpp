@@ -42,6 +42,18 @@ bool MeansFailedAuthentication(const QName &faultCode) {
   });
 }
 
+bool IsUtf8(std::string charset) {
+  std::transform(charset.begin(), charset.end(), charset.begin(),
+                 [](char c) { return c >= 'A' && c <= 'Z' ? static_cast<char>(c - 'A' + 'a') : c; });
+  return charset == "utf-8" || charset == "utf8";
+}
+
+/// Says which charset was declared, if any but UTF-8: that may be all that is wrong.
+std::string DescribeCharset(const Tarvel::Reader &response) {
+  const std::string charset = response.GetDeclaredCharset();
+  return charset.empty() || IsUtf8(charset) ? "" : " (charset " + charset + ")";
+}
+
 } // namespace
 
 Ref<const ElementNode> ParseResponseDocument(Tarvel::Reader &response) {
@@ -51,7 +63,7 @@ Ref<const ElementNode> ParseResponseDocument(Tarvel::Reader &response) {
     ParseXML(response, parsed);
     document = parsed;
   } catch (const Tarvel::Xml::XMLParseException &error) {
-    throw SsoException(std::string("Response is not well-formed XML: ") + error.what());
+    throw SsoException(std::string("Response is not well-formed XML: ") + error.what() + DescribeCharset(response));
   }
   return Ref<const ElementNode>(document->GetDocumentElement());
 }

@@ -14,7 +14,8 @@
 namespace SsoClient {
 
 /// The document element of what `response` holds; the reference keeps the whole tree.
-/// @throws SsoException when it is not well-formed XML.
+/// @throws SsoException when it is not well-formed XML; the message ends in the charset that the response declares, unless
+///         that is UTF-8.
 Tarvel::Ref<const Tarvel::Xml::ElementNode> ParseResponseDocument(Tarvel::Reader &response);
 
 /// Returns when there is no SOAP 1.1 fault in the body of `envelope`.

@@ -2,10 +2,13 @@
 
 #include "transport/connection_spec_impl.h"
 
+#include "transport/out_of_memory.h"
+
 #include <ssoclient/connection_spec.h>
 #include <tarvel/core/exception.h>
 #include <tarvel/core/message_formatter.h>
 
+#include <new>
 #include <utility>
 
 namespace SsoClient {
@@ -28,7 +31,6 @@ struct TlsLayer {
   std::string endpoint; // under which the session is remembered
   Ref<SSLContext> context;
   std::string parameter;
-  Tarvel::System::NetworkException outOfMemory{"Out of memory"}; // made while there is memory
 };
 
 void StartHandshake(const TlsLayer &layer, const Ref<Stream> &socket,
@@ -41,7 +43,27 @@ void StartHandshake(const TlsLayer &layer, const Ref<Stream> &socket,
                          [completion, stream](const Exception *failure) { completion(stream, failure); });
 }
 
-/// On an I/O thread: whoever waits for the completion would get no answer if an exception left this.
+[[noreturn]] void ThrowForeignFailure(const std::string &endpoint, const char *text) {
+  throw Tarvel::InvalidStateException("The connection to " + endpoint + " failed: " + text);
+}
+
+/// The same; whatever it throws is a `Tarvel::Exception` or `std::bad_alloc`.
+void StartHandshakeOrThrowOurs(const TlsLayer &layer, const Ref<Stream> &socket,
+                               const ConnectionSpec::ConnectCompletion &completion) {
+  try {
+    StartHandshake(layer, socket, completion);
+  } catch (const Exception &) {
+    throw;
+  } catch (const std::bad_alloc &) {
+    throw;
+  } catch (const std::exception &exception) {
+    ThrowForeignFailure(layer.endpoint, exception.what());
+  } catch (...) {
+    ThrowForeignFailure(layer.endpoint, "an object that is not an exception was thrown");
+  }
+}
+
+/// On an I/O thread: an exception that got away would leave whoever waits for the completion without an answer.
 void OnSocketConnected(const TlsLayer &layer, const Ref<Stream> &socket, const Exception *failure,
                        const ConnectionSpec::ConnectCompletion &completion) {
   if (failure) {
@@ -49,11 +71,11 @@ void OnSocketConnected(const TlsLayer &layer, const Ref<Stream> &socket, const E
     return;
   }
   try {
-    StartHandshake(layer, socket, completion);
+    StartHandshakeOrThrowOurs(layer, socket, completion);
   } catch (const Exception &exception) {
     completion(socket, &exception);
-  } catch (...) {
-    completion(socket, &layer.outOfMemory); // the platform throws nothing else that is not its own
+  } catch (const std::bad_alloc &) {
+    completion(socket, &OutOfMemory());
   }
 }
 
@@ -81,7 +103,8 @@ bool SsoCustomConnectionSpecImpl::IsReuseOnAuthErrorSupported() const {
 
 Ref<ScheduledItem> SsoCustomConnectionSpecImpl::AsyncConnect(ConnectCompletion completion) const {
   const Ref<TcpClientSocket> socket = Tarvel::System::CreateTcpClientSocket();
-  Ref<ScheduledItem> canceller = Tarvel::System::CreateStreamCanceller(socket); // nothing may fail after the start
+  // Made first: whatever throws here does so before the completion can be called.
+  Ref<ScheduledItem> canceller = Tarvel::System::CreateStreamCanceller(socket);
   socket->AsyncConnect(
       GetConnectionTargetHost(), m_port,
       [socket, completion = std::move(completion)](const Exception *failure) { completion(socket, failure); });
@@ -120,6 +143,7 @@ bool SsoCustomSslConnectionSpecImpl::IsReuseOnAuthErrorSupported() const {
 
 Ref<ScheduledItem> SsoCustomSslConnectionSpecImpl::AsyncConnect(ConnectCompletion completion) const {
   TlsLayer layer{m_inner->GetConnectionTargetHost(), GetEndpointString(), m_context, m_parameter};
+  OutOfMemory(); // made while there is memory
   return m_inner->AsyncConnect([layer = std::move(layer), completion = std::move(completion)](
                                    const Ref<Stream> &socket, const Exception *failure) {
     OnSocketConnected(layer, socket, failure, completion);

@@ -2,8 +2,12 @@
 
 #include "transport/https_session.h"
 
+#include "transport/out_of_memory.h"
+
 #include <ssoclient/exceptions.h>
 #include <tarvel/http/cookie_store.h>
+
+#include <new>
 
 namespace SsoClient {
 
@@ -28,6 +32,7 @@ bool HasBody(int status) {
 HttpsSession::HttpsSession(const Ref<Tarvel::Http::ConnectionSpec> &spec, const std::string &path,
                            std::int64_t timeoutMicroseconds)
     : m_path(path), m_timeoutMicroseconds(timeoutMicroseconds) {
+  OutOfMemory(); // made while there is memory
   Ref<Tarvel::Http::CookieStore> cookies;
   Tarvel::Http::CreateCookieStore("", cookies);
   Tarvel::Http::CreateHttpUserAgent(spec, cookies, nullptr, m_userAgent);
@@ -92,7 +97,12 @@ void AsyncTranslateResponse(const TransportSession::Completion &completion, cons
                             const Ref<ClientResponse> &response, const Ref<PendingRequestItem> &) {
   std::shared_ptr<const Exception> error;
   Ref<Reader> body;
-  TranslateResponse(exception, response, error, body);
+  try {
+    TranslateResponse(exception, response, error, body);
+  } catch (const std::bad_alloc &) {
+    completion(&OutOfMemory(), nullptr);
+    return;
+  }
   completion(error.get(), body.get());
 }
 

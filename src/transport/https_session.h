@@ -49,6 +49,7 @@ void TranslateResponse(const Tarvel::Exception *exception, const Tarvel::Ref<Tar
                        std::shared_ptr<const Tarvel::Exception> &error, Tarvel::Ref<Tarvel::Reader> &body);
 
 /// The completion function of an asynchronous request: calls back once, with the error or with the body, the other null.
+/// When memory runs out on the way, the error is a `Tarvel::OutOfMemoryException`.
 void AsyncTranslateResponse(const TransportSession::Completion &completion, const Tarvel::Exception *exception,
                             const Tarvel::Ref<Tarvel::Http::ClientResponse> &response,
                             const Tarvel::Ref<Tarvel::Http::PendingRequestItem> &pending);

@@ -43,6 +43,13 @@ SsoClient::TokenSpec FullSpec() {
   return spec;
 }
 
+SsoClient::TokenSpec BeyondAsciiSpec() {
+  SsoClient::TokenSpec spec = PlainSpec();
+  spec.audienceRestriction = {"https://grün.example/ł"};
+  spec.advice = {{"https://advice.example/語", {{"größe", {"rød", "😀"}}}}};
+  return spec;
+}
+
 SsoClient::TokenSpec DelegatedSpec() {
   SsoClient::TokenSpec spec = FullSpec();
   spec.delegateTo = std::string("bob@corp.example");
@@ -61,6 +68,10 @@ std::vector<SampleRequest> SampleRequests() {
       {"user-password", false, [=](Request &r) { plain->BuildUserPassTokenRequest(user, password, PlainSpec(), r); }},
       {"user-password-signed", true,
        [=](Request &r) { identified->BuildUserPassTokenRequest(user, password, FullSpec(), r); }},
+      {"user-password-beyond-ascii", true,
+       [=](Request &r) {
+         identified->BuildUserPassTokenRequest("jürgen@łódź.example", "語 & 😀", BeyondAsciiSpec(), r);
+       }},
       {"user-password-delegated", false,
        [=](Request &r) { identified->BuildUserPassTokenRequest(user, password, DelegatedSpec(), r); }},
       {"spnego-initial", false, [=](Request &r) { plain->BuildInitialSPNegoRequest(PlainSpec(), leg, r); }},

@@ -34,6 +34,9 @@ SsoClient::TokenSpec PlainSpec();
 /// Everything that a spec can ask for but a delegate.
 SsoClient::TokenSpec FullSpec();
 
+/// Texts in every field that takes one but the delegate, none of them ASCII.
+SsoClient::TokenSpec BeyondAsciiSpec();
+
 SsoClient::TokenSpec DelegatedSpec();
 
 std::vector<SampleRequest> SampleRequests();

@@ -106,6 +106,7 @@ InvalidArgumentException::InvalidArgumentException(const std::string &detail)
 
 TARVEL_DEFINE_EXCEPTION(InvalidArgumentException)
 TARVEL_DEFINE_EXCEPTION(InvalidStateException)
+TARVEL_DEFINE_EXCEPTION(OutOfMemoryException)
 TARVEL_DEFINE_EXCEPTION(TypeMismatchException)
 TARVEL_DEFINE_EXCEPTION(Base64FormatException)
 TARVEL_DEFINE_EXCEPTION(DateTimeFormatException)

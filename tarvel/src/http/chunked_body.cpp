@@ -2,6 +2,7 @@
 
 #include "http/chunked_body.h"
 
+#include "core/wiped_growth.h"
 #include "http/header_syntax.h"
 
 #include <tarvel/http/user_agent.h>
@@ -48,7 +49,7 @@ std::size_t ChunkedBodyDecoder::Put(std::string_view bytes, std::string &body) {
       continue;
     }
     const std::string_view data = bytes.substr(taken, m_size);
-    body.append(data);
+    AppendWiping(body, data);
     taken += data.size();
     m_size -= data.size();
     if (m_size == 0) {

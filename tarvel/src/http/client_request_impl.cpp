@@ -2,6 +2,8 @@
 
 #include "http/client_request_impl.h"
 
+#include "core/wiped_growth.h"
+
 #include <tarvel/core/secure_wipe.h>
 
 #include <algorithm>
@@ -101,15 +103,7 @@ void ClientRequestImpl::SetHeader(std::string_view name, std::string_view value)
 }
 
 void ClientRequestImpl::WriteBody(std::string_view bytes) {
-  std::string &body = m_data.body;
-  if (body.capacity() - body.size() < bytes.size()) {
-    std::string larger;
-    larger.reserve(std::max(body.size() + bytes.size(), 2 * body.size()));
-    larger.append(body);
-    SecureWipe(body);
-    body.swap(larger);
-  }
-  body.append(bytes);
+  AppendWiping(m_data.body, bytes);
 }
 
 RequestData ClientRequestImpl::Take() {

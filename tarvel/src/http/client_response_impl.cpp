@@ -2,12 +2,16 @@
 
 #include "http/client_response_impl.h"
 
+#include "http/charset.h"
+
 #include <algorithm>
 #include <utility>
 
 namespace Tarvel::Http {
 
-ClientResponseImpl::ClientResponseImpl(ResponseData data) : m_data(std::move(data)) {}
+ClientResponseImpl::ClientResponseImpl(ResponseData data) : m_data(std::move(data)) {
+  RecodeToUtf8(m_data.body, GetDeclaredCharset());
+}
 
 std::size_t ClientResponseImpl::Read(char *buffer, std::size_t length) {
   const std::size_t count = m_data.body.copy(buffer, length, m_position);
@@ -19,6 +23,12 @@ std::string ClientResponseImpl::ReadToEnd(std::size_t) {
   std::string rest = std::exchange(m_data.body, std::string());
   rest.erase(0, std::exchange(m_position, 0));
   return rest;
+}
+
+std::string ClientResponseImpl::GetDeclaredCharset() const {
+  std::string contentType;
+  GetHeader("Content-Type", contentType);
+  return FindCharset(contentType);
 }
 
 int ClientResponseImpl::GetStatusCode() const noexcept {

@@ -20,6 +20,7 @@ public:
 
   std::size_t Read(char *buffer, std::size_t length) override;
   std::string ReadToEnd(std::size_t maximumBytes) override;
+  std::string GetDeclaredCharset() const override;
   int GetStatusCode() const noexcept override;
   const std::string &GetReasonPhrase() const noexcept override;
   bool GetHeader(std::string_view name, std::string &value) const override;

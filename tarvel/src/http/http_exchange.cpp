@@ -3,6 +3,7 @@
 #include "http/http_exchange.h"
 
 #include "http/client_response_impl.h"
+#include "http/current_failure.h"
 #include "system/uncaught_exception.h"
 
 #include <tarvel/core/secure_wipe.h>
@@ -53,16 +54,27 @@ std::string MakeHostHeader(const ConnectionSpec &spec, bool isSecure) {
 HttpExchange::HttpExchange(const Ref<ConnectionSpec> &spec, const Ref<CookieStore> &cookies, RequestData request,
                            UserAgent::CompletionFunction completion)
     : m_spec(spec), m_cookies(cookies), m_endpoint(spec->GetEndpointString()), m_request(std::move(request)),
-      m_reader(m_request.method == "HEAD"), m_completion(std::move(completion)) {}
+      m_reader(m_request.method == "HEAD"), m_completion(std::move(completion)) {
+  OutOfMemory(); // made while there is memory
+}
 
 HttpExchange::~HttpExchange() {
   SecureWipe(m_message);
+  SecureWipe(m_buffer.data(), m_buffer.size());
 }
 
 void HttpExchange::Start() {
   const Ref self(this);
-  Ref<System::ScheduledItem> connecting = m_spec->AsyncConnect(
-      [self](const Ref<System::Stream> &stream, const Exception *failure) { self->OnConnected(stream, failure); });
+  Ref<System::ScheduledItem> connecting;
+  try {
+    connecting = m_spec->AsyncConnect(
+        [self](const Ref<System::Stream> &stream, const Exception *failure) { self->OnConnected(stream, failure); });
+  } catch (...) {
+    if (Abandon()) {
+      throw;
+    }
+    return; // the specification called back before it threw: that decides
+  }
   bool isCancelled = false;
   {
     const std::lock_guard<System::ForkSafeMutex> lock(m_mutex);
@@ -77,24 +89,40 @@ void HttpExchange::Start() {
   }
 }
 
+/// Ends the exchange in silence, if its connect has not ended.
+bool HttpExchange::Abandon() noexcept {
+  UserAgent::CompletionFunction completion; // destroyed outside the lock
+  const std::lock_guard<System::ForkSafeMutex> lock(m_mutex);
+  if (m_isConnectOver) {
+    return false;
+  }
+  m_isConnectOver = m_isFinishing = true;
+  completion.swap(m_completion);
+  return true;
+}
+
 void HttpExchange::OnConnected(const Ref<System::Stream> &stream, const Exception *failure) {
   bool isCancelled = false;
   {
     const std::lock_guard<System::ForkSafeMutex> lock(m_mutex);
+    if (std::exchange(m_isConnectOver, true)) {
+      return;
+    }
     m_connecting.reset();
     m_stream = stream;
     isCancelled = m_isCancelled;
   }
-  if (failure || isCancelled) {
-    Finish(failure, nullptr);
+  if (isCancelled) {
+    Finish(nullptr, nullptr);
     return;
   }
-  if (!stream) {
-    const InvalidStateException nothing("A connection specification reported neither a stream nor a failure");
-    Finish(&nothing, nullptr);
-    return;
-  }
-  Step([this, &stream] {
+  Step([&] {
+    if (failure) {
+      failure->Throw();
+    }
+    if (!stream) {
+      throw InvalidStateException("A connection specification reported neither a stream nor a failure");
+    }
     Send(stream);
     Read(stream);
   });
@@ -136,8 +164,7 @@ void HttpExchange::Read(const Ref<System::Stream> &stream) {
 
 void HttpExchange::OnRead(std::size_t count, const Exception *failure) {
   if (failure) {
-    Fail(*failure);
-    return;
+    failure->Throw();
   }
   if (count == 0) {
     OnEnd();
@@ -178,8 +205,7 @@ void HttpExchange::FinishEnd() {
     writeFailure = m_writeFailure;
   }
   if (writeFailure) {
-    Fail(*writeFailure);
-    return;
+    writeFailure->Throw();
   }
   Judge([this] { m_reader.PutEnd(); });
   FinishResponse();
@@ -207,21 +233,28 @@ void HttpExchange::Judge(const std::function<void()> &call) const {
   }
 }
 
-void HttpExchange::Step(const std::function<void()> &step) {
+template <typename Call>
+void HttpExchange::Step(const Call &step) noexcept {
   try {
     step();
-  } catch (const Exception &exception) {
-    Fail(exception);
-  } catch (const std::exception &exception) {
-    Fail(System::NetworkException("The request to " + m_endpoint + " failed: " + exception.what()));
+  } catch (...) {
+    Finish(CurrentFailure(m_endpoint), nullptr);
+  }
+}
+
+std::shared_ptr<const Exception> HttpExchange::Cancelled() const noexcept {
+  try {
+    throw System::NetworkException("The request to " + m_endpoint + " was cancelled");
+  } catch (...) {
+    return CurrentFailure(m_endpoint);
   }
 }
 
 /// Neither failure nor response: the request was cancelled.
-void HttpExchange::Finish(const Exception *failure, const Ref<ClientResponse> &response) {
+void HttpExchange::Finish(std::shared_ptr<const Exception> failure, const Ref<ClientResponse> &response) noexcept {
   Ref<System::Stream> stream;
   UserAgent::CompletionFunction completion;
-  std::shared_ptr<const Exception> outcome(failure ? failure->Clone() : nullptr);
+  bool isCancelled = false;
   {
     const std::lock_guard<System::ForkSafeMutex> lock(m_mutex);
     if (std::exchange(m_isFinishing, true)) {
@@ -229,18 +262,19 @@ void HttpExchange::Finish(const Exception *failure, const Ref<ClientResponse> &r
     }
     stream = std::move(m_stream);
     completion = std::exchange(m_completion, nullptr);
-    if (m_isCancelled && !response) {
-      outcome = std::make_shared<System::NetworkException>("The request to " + m_endpoint + " was cancelled");
-    }
+    isCancelled = m_isCancelled && !response;
+  }
+  if (isCancelled) {
+    failure = Cancelled();
   }
   if (stream) {
     stream->Close();
   }
-  Complete(completion, outcome.get(), response);
+  Complete(completion, failure.get(), response);
   completion = nullptr; // what it holds is gone before anybody who waits goes on
   {
     const std::lock_guard<System::ForkSafeMutex> lock(m_mutex);
-    m_failure = outcome;
+    m_failure = failure;
     m_response = response;
     m_isDone = true;
   }

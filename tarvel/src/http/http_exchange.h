@@ -29,7 +29,7 @@ public:
   HttpExchange(const Ref<ConnectionSpec> &spec, const Ref<CookieStore> &cookies, RequestData request,
                UserAgent::CompletionFunction completion);
 
-  /// Once.
+  /// Once. When it throws, nothing has been reported, and nothing will be.
   void Start();
 
   /// Waits, on this thread alone, until the completion function has run.
@@ -59,10 +59,12 @@ private:
 
   /// Runs one call of the reader, and says in its exception whose response it is about.
   void Judge(const std::function<void()> &call) const;
-  /// Runs one step of the road; what it throws is how the exchange ends.
-  void Step(const std::function<void()> &step);
-  void Fail(const Exception &failure) { Finish(&failure, nullptr); }
-  void Finish(const Exception *failure, const Ref<ClientResponse> &response);
+  /// Runs one step; whatever it throws is how the exchange ends.
+  template <typename Call>
+  void Step(const Call &step) noexcept;
+  std::shared_ptr<const Exception> Cancelled() const noexcept;
+  void Finish(std::shared_ptr<const Exception> failure, const Ref<ClientResponse> &response) noexcept;
+  bool Abandon() noexcept;
   void Complete(const UserAgent::CompletionFunction &completion, const Exception *failure,
                 const Ref<ClientResponse> &response) noexcept;
 
@@ -77,7 +79,7 @@ private:
   // For one step at a time, hence without a lock. The message stays until it is written; then it is wiped.
   RequestData m_request;
   std::string m_message;
-  std::array<char, BUFFER_BYTES> m_buffer;
+  std::array<char, BUFFER_BYTES> m_buffer; // as secret as the response
   ResponseReader m_reader;
   bool m_isSecure = false;
 
@@ -87,6 +89,7 @@ private:
   Ref<System::ScheduledItem> m_connecting;
   Ref<System::Stream> m_stream;
   UserAgent::CompletionFunction m_completion;
+  bool m_isConnectOver = false;
   bool m_isCancelled = false;
   bool m_isWriteOver = false;
   bool m_endWaitsForWrite = false;

@@ -2,6 +2,10 @@
 
 #include "http/response_reader.h"
 
+#include "core/wiped_growth.h"
+
+#include <tarvel/core/secure_wipe.h>
+
 #include <boost/asio/buffer.hpp>
 #include <boost/beast/http/basic_parser.hpp>
 #include <boost/beast/http/error.hpp>
@@ -23,7 +27,7 @@ constexpr int MAX_INTERIM_RESPONSES = 16;
 
 constexpr int SWITCHING_PROTOCOLS = 101;
 constexpr int NO_CONTENT = 204;
-constexpr int NOT_MODIFIED = 304;
+constexpr int INTERNAL_SERVER_ERROR = 500; // which has a body that counts: SOAP 1.1 sends its faults so
 
 /// A length that a server states is believed only so far; the rest comes as the bytes do.
 constexpr std::size_t MAX_RESERVED_BYTES = 256 * 1024;
@@ -44,7 +48,7 @@ void CheckBodyLength(std::uint64_t length) {
   throw HttpException("its header is not HTTP/1.x (" + reason + ")");
 }
 
-/// Once it has seen a part, the parser waits for a whole header; what talks no HTTP would never send its end.
+/// What does not speak HTTP would never send the end of a header.
 void CheckBeginning(std::string_view header) {
   constexpr std::string_view BEGINNING = "HTTP/1.";
   const std::size_t length = std::min(header.size(), BEGINNING.size());
@@ -59,6 +63,24 @@ std::string DescribeStatus(const ResponseData &response) {
 
 bool IsInterim(int status) noexcept {
   return status / 100 == 1 && status != SWITCHING_PROTOCOLS;
+}
+
+/// Whether the status says all: its body, if it has one, is not read.
+bool IsRefusal(int status) noexcept {
+  return status / 100 != 2 && status != INTERNAL_SERVER_ERROR && !IsInterim(status);
+}
+
+bool IsAboutBody(const error_code &error) {
+  return error == http::error::bad_content_length || error == http::error::multiple_content_length ||
+         error == http::error::bad_transfer_encoding;
+}
+
+/// A status line that ends after its code lacks a blank, which Beast wants. Many servers forget it.
+void CompleteStatusLine(std::string &header) {
+  constexpr std::string_view EXAMPLE = "HTTP/1.1 503";
+  if (header.find("\r\n") == EXAMPLE.size()) {
+    header.insert(EXAMPLE.size(), 1, ' ');
+  }
 }
 
 } // namespace
@@ -133,48 +155,58 @@ private:
   bool m_knowsCodings = true;
 };
 
+ResponseData::~ResponseData() {
+  SecureWipe(body);
+}
+
 ResponseReader::ResponseReader(bool answersHead)
     : m_answersHead(answersHead), m_header(std::make_unique<ResponseHeaderParser>()) {}
 
-ResponseReader::~ResponseReader() = default;
+ResponseReader::~ResponseReader() {
+  // Bytes of a body may have come with those of the header.
+  SecureWipe(m_pendingHeader);
+}
 
 void ResponseReader::Put(std::string_view bytes) {
   while (!bytes.empty() && !IsComplete()) {
     bytes.remove_prefix(m_stage == Stage::HEADER ? PutHeader(bytes) : PutBody(bytes));
   }
-  if (!bytes.empty() && m_data.status != SWITCHING_PROTOCOLS) {
-    throw HttpException("it goes on after its end");
-  }
 }
 
-/// Takes all bytes, or those up to the header's end.
+/// Takes all bytes, or those up to the header's end. The header is judged when it is whole, so that it does not matter how
+/// its bytes are packed.
 std::size_t ResponseReader::PutHeader(std::string_view bytes) {
+  constexpr std::string_view END = "\r\n\r\n";
   const std::size_t known = m_pendingHeader.size();
   m_pendingHeader.append(bytes);
-  if (m_header->GetData().status == 0) {
-    CheckBeginning(m_pendingHeader);
-  }
-  std::size_t used = 0;
-  error_code error;
-  do {
-    used += m_header->put(boost::asio::buffer(m_pendingHeader.data() + used, m_pendingHeader.size() - used), error);
-  } while (!error && !m_header->is_header_done());
-  if (error == http::error::header_limit) {
-    CheckHeaderLength(MAX_HEADER_BYTES + 1);
-  }
-  if (error && error != http::error::need_more) {
-    RefuseHeader(error.message());
-  }
-  m_headerBytes += used;
-  if (!m_header->is_header_done()) {
-    m_pendingHeader.erase(0, used);
-    CheckHeaderLength(m_headerBytes + m_pendingHeader.size());
+  CheckBeginning(m_pendingHeader);
+  const std::size_t end = m_pendingHeader.find(END, known - std::min(known, END.size() - 1));
+  if (end == std::string::npos) {
+    CheckHeaderLength(m_pendingHeader.size());
     return bytes.size();
   }
-  CheckHeaderLength(m_headerBytes);
+  const std::size_t length = end + END.size();
+  CheckHeaderLength(length);
+  m_pendingHeader.resize(length);
+  ParseHeader();
   m_pendingHeader.clear();
+  return length - known;
+}
+
+void ResponseReader::ParseHeader() {
+  CompleteStatusLine(m_pendingHeader);
+  error_code error;
+  m_header->put(boost::asio::buffer(m_pendingHeader), error);
+  const bool isRefusal = IsRefusal(m_header->GetData().status);
+  if (error && !(isRefusal && IsAboutBody(error))) {
+    RefuseHeader(error.message());
+  }
+  if (isRefusal) {
+    m_data = std::move(m_header->GetData());
+    m_stage = Stage::COMPLETE;
+    return;
+  }
   FinishHeader();
-  return used - known;
 }
 
 void ResponseReader::FinishHeader() {
@@ -192,11 +224,11 @@ void ResponseReader::FinishHeader() {
   }
 }
 
-/// RFC 9112, section 6.3.
+/// RFC 9112, section 6.3, for the statuses whose body counts.
 void ResponseReader::ChooseBody() {
   const int status = m_header->GetData().status;
   const bool isChunked = m_header->IsChunked();
-  if (m_answersHead || status / 100 == 1 || status == NO_CONTENT || status == NOT_MODIFIED) {
+  if (m_answersHead || status == NO_CONTENT) {
     m_stage = Stage::COMPLETE;
     return;
   }
@@ -237,11 +269,11 @@ std::size_t ResponseReader::PutBody(std::string_view bytes) {
   }
   if (m_stage == Stage::BODY_TO_END) {
     CheckBodyLength(body.size() + bytes.size());
-    body.append(bytes);
+    AppendWiping(body, bytes);
     return bytes.size();
   }
   const std::string_view data = bytes.substr(0, m_length - body.size());
-  body.append(data);
+  AppendWiping(body, data);
   if (body.size() == m_length) {
     m_stage = Stage::COMPLETE;
   }
@@ -251,8 +283,8 @@ std::size_t ResponseReader::PutBody(std::string_view bytes) {
 void ResponseReader::PutEnd() {
   switch (m_stage) {
   case Stage::HEADER:
-    throw HttpException(m_headerBytes + m_pendingHeader.size() == 0 ? "the connection ended before it"
-                                                                    : "the connection ended within its header");
+    throw HttpException(m_pendingHeader.empty() ? "the connection ended before it"
+                                                : "the connection ended within its header");
   case Stage::BODY_OF_LENGTH:
     throw HttpException("the connection ended after " + std::to_string(m_data.body.size()) + " of the body's " +
                         std::to_string(m_length) + " bytes");

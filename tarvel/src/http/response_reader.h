@@ -16,7 +16,15 @@
 
 namespace Tarvel::Http {
 
+/// Its body is secret.
 struct ResponseData {
+  ResponseData() = default;
+  ResponseData(const ResponseData &) = delete;
+  ResponseData &operator=(const ResponseData &) = delete;
+  ResponseData(ResponseData &&) noexcept = default;
+  ResponseData &operator=(ResponseData &&) noexcept = default; ///< onto one without a body, which is not wiped
+  ~ResponseData();
+
   int status = 0;
   std::string reason;
   HeaderFields fields; ///< of the header; a trailer's are dropped
@@ -26,7 +34,8 @@ struct ResponseData {
 class ResponseHeaderParser;
 
 /// Reads the final response to one request, passing over interim ones (1xx but 101), in pieces of any size. Strict where
-/// leniency would let two parties read the same bytes differently, or take a part for the whole. Messages of its
+/// leniency would let two parties read the same bytes differently, or take a part for the whole. A status other than 2xx
+/// and 500 says all: the response is complete with its header, whatever that says about a body. Messages of its
 /// exceptions are half sentences about the response. After an exception it must not be used again.
 class ResponseReader {
 public:
@@ -36,8 +45,9 @@ public:
   ResponseReader &operator=(const ResponseReader &) = delete;
   ~ResponseReader();
 
-  /// @throws HttpException when the bytes are no response, contradict themselves, are over a limit, or go on after the
-  ///         response's end.
+  /// Takes the next bytes of the connection. What comes after the response's end is dropped: every request says that the
+  /// connection ends with its response.
+  /// @throws HttpException when the bytes are not a response, contradict themselves, or are over a limit.
   void Put(std::string_view bytes);
 
   /// The connection has ended in order, which is how a body without a length ends.
@@ -58,14 +68,14 @@ private:
   std::size_t PutHeader(std::string_view bytes);
   std::size_t PutBody(std::string_view bytes);
   void FinishHeader();
+  void ParseHeader();
   void ChooseBody();
   void CheckContentCoding() const;
 
   const bool m_answersHead;
   Stage m_stage = Stage::HEADER;
   std::unique_ptr<ResponseHeaderParser> m_header;
-  std::string m_pendingHeader; // bytes that the parser wants to see again, with more
-  std::size_t m_headerBytes = 0;
+  std::string m_pendingHeader; // of the response that is read, not of interim ones before it
   int m_interimResponses = 0;
   std::size_t m_length = 0; // of the body, when it is known
   ChunkedBodyDecoder m_chunks;

@@ -2,9 +2,11 @@
 
 #include <tarvel/io/reader.h>
 
-#include <algorithm>
+#include "core/wiped_growth.h"
+
+#include <tarvel/core/secure_wipe.h>
+
 #include <array>
-#include <cstring>
 #include <utility>
 
 namespace Tarvel {
@@ -13,9 +15,11 @@ namespace {
 
 constexpr std::size_t CHUNK_LENGTH = 16 * 1024;
 
+/// What is read may be a response with a token in it: it is overwritten, unless it was taken.
 class StringReaderImpl final : public Reader {
 public:
-  explicit StringReaderImpl(std::string text) noexcept : m_text(std::move(text)) {}
+  explicit StringReaderImpl(std::string &&text) noexcept : m_text(std::move(text)) {}
+  ~StringReaderImpl() override { SecureWipe(m_text); }
 
   std::size_t Read(char *buffer, std::size_t length) override {
     const std::size_t count = m_text.copy(buffer, length, m_position);
@@ -46,9 +50,14 @@ std::string Reader::ReadToEnd(std::size_t maximumBytes) {
     if (count == 0) {
       break;
     }
-    text.append(chunk.data(), count);
+    AppendWiping(text, {chunk.data(), count});
   }
+  SecureWipe(chunk.data(), chunk.size());
   return text;
+}
+
+std::string Reader::GetDeclaredCharset() const {
+  return {};
 }
 
 Ref<Reader> CreateStringReader(std::string text) {

@@ -2,10 +2,10 @@
 
 #include <tarvel/io/writer.h>
 
+#include "core/wiped_growth.h"
+
 #include <tarvel/core/secure_wipe.h>
 
-#include <algorithm>
-#include <cstddef>
 #include <utility>
 
 namespace Tarvel {
@@ -18,24 +18,11 @@ class StringWriterImpl final : public StringWriter {
 public:
   ~StringWriterImpl() override { SecureWipe(m_text); }
 
-  void Write(std::string_view bytes) override {
-    if (m_text.capacity() - m_text.size() < bytes.size()) {
-      Grow(bytes.size());
-    }
-    m_text += bytes;
-  }
+  void Write(std::string_view bytes) override { AppendWiping(m_text, bytes); }
   const std::string &GetText() const override { return m_text; }
   std::string TakeText() override { return std::exchange(m_text, std::string()); }
 
 private:
-  void Grow(std::size_t bytes) {
-    std::string larger;
-    larger.reserve(std::max(2 * m_text.capacity(), m_text.size() + bytes));
-    larger += m_text;
-    m_text.swap(larger);
-    SecureWipe(larger);
-  }
-
   std::string m_text;
 };
 

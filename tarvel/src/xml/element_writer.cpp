@@ -2,10 +2,13 @@
 
 #include <tarvel/xml/node.h>
 
+#include "xml/characters.h"
+
 #include <tarvel/core/secure_wipe.h>
 
 #include <array>
 #include <cstddef>
+#include <cstdint>
 #include <string>
 #include <string_view>
 
@@ -15,13 +18,18 @@ namespace Xml {
 namespace {
 
 constexpr std::size_t FLUSH_BYTES = 8 * 1024;
+constexpr unsigned char FIRST_BEYOND_ASCII = 0x80;
 
 /// A set of characters, asked for each byte that is written.
 class CharacterSet {
 public:
-  constexpr explicit CharacterSet(std::string_view characters) {
+  /// @param form with references, every byte of a character beyond ASCII is in the set as well.
+  constexpr CharacterSet(std::string_view characters, CharacterForm form) {
     for (const char character : characters) {
       m_contains[static_cast<unsigned char>(character)] = true;
+    }
+    for (std::size_t byte = FIRST_BEYOND_ASCII; byte < m_contains.size(); ++byte) {
+      m_contains[byte] = form == CharacterForm::REFERENCES;
     }
   }
 
@@ -40,8 +48,21 @@ private:
 
 // A parser turns a carriage return into a line feed and, in attribute values, all white space into blanks. A ">" may not
 // follow "]]" in text.
-constexpr CharacterSet SPECIAL_IN_TEXT("&<>\r");
-constexpr CharacterSet SPECIAL_IN_ATTRIBUTES("&<\"\t\n\r");
+constexpr std::string_view SPECIAL_IN_TEXT = "&<>\r";
+constexpr std::string_view SPECIAL_IN_ATTRIBUTES = "&<\"\t\n\r";
+
+/// What is written as a reference.
+struct Specials {
+  CharacterSet inText;
+  CharacterSet inAttributes;
+};
+
+constexpr Specials SpecialsOf(CharacterForm form) {
+  return {CharacterSet(SPECIAL_IN_TEXT, form), CharacterSet(SPECIAL_IN_ATTRIBUTES, form)};
+}
+
+constexpr Specials SPECIALS_OF_UTF8 = SpecialsOf(CharacterForm::UTF8);
+constexpr Specials SPECIALS_OF_REFERENCES = SpecialsOf(CharacterForm::REFERENCES);
 
 /// Gathers the pieces of markup, so that the writer is called for larger ones. The buffer never grows, so that no copy of
 /// a text that may be secret is left behind in the heap.
@@ -72,8 +93,14 @@ public:
         *this << text;
         return;
       }
-      *this << text.substr(0, next) << GetReference(text[next]);
-      text.remove_prefix(next + 1);
+      *this << text.substr(0, next);
+      std::size_t behind = next;
+      if (static_cast<unsigned char>(text[next]) >= FIRST_BEYOND_ASCII) {
+        WriteNumber(ReadCharacter(text, behind));
+      } else {
+        *this << GetReference(text[behind++]);
+      }
+      text.remove_prefix(behind);
     }
   }
 
@@ -83,6 +110,18 @@ public:
   }
 
 private:
+  /// The texts of a tree are UTF-8: `character` is one.
+  void WriteNumber(std::uint32_t character) {
+    constexpr std::string_view DIGITS = "0123456789ABCDEF";
+    std::array<char, 8> digits{}; // of 32 bits
+    std::size_t begin = digits.size();
+    for (std::uint32_t rest = character; rest > 0; rest /= 16) {
+      digits[--begin] = DIGITS[rest % 16];
+    }
+    *this << "&#x" << std::string_view(digits.data() + begin, digits.size() - begin) << ";";
+    SecureWipe(digits.data(), digits.size());
+  }
+
   static std::string_view GetReference(char character) noexcept {
     switch (character) {
     case '&':
@@ -106,24 +145,24 @@ private:
   std::string m_buffer;
 };
 
-void WriteStartTag(const ElementNode &element, MarkupOutput &output) {
+void WriteStartTag(const ElementNode &element, const Specials &specials, MarkupOutput &output) {
   output << "<" << element.GetName();
   for (const Attribute *attribute = element.GetFirstAttribute(); attribute; attribute = attribute->GetNext()) {
     output << " " << attribute->GetName() << "=\"";
-    output.WriteEscaped(attribute->GetValue(), SPECIAL_IN_ATTRIBUTES);
+    output.WriteEscaped(attribute->GetValue(), specials.inAttributes);
     output << "\"";
   }
   output << ">";
 }
 
 /// Writes the node, or only the start tag of an element.
-void WriteBegin(const Node &node, MarkupOutput &output) {
+void WriteBegin(const Node &node, const Specials &specials, MarkupOutput &output) {
   switch (node.GetKind()) {
   case NodeKind::ELEMENT:
-    WriteStartTag(static_cast<const ElementNode &>(node), output);
+    WriteStartTag(static_cast<const ElementNode &>(node), specials, output);
     break;
   case NodeKind::TEXT:
-    output.WriteEscaped(static_cast<const TextNode &>(node).GetValue(), SPECIAL_IN_TEXT);
+    output.WriteEscaped(static_cast<const TextNode &>(node).GetValue(), specials.inText);
     break;
   case NodeKind::COMMENT:
     output << "<!--" << static_cast<const CommentNode &>(node).GetValue() << "-->";
@@ -147,11 +186,12 @@ void WriteEnd(const Node &node, MarkupOutput &output) {
 
 } // namespace
 
-void ElementNode::WriteTo(Writer &writer) const {
+void ElementNode::WriteTo(Writer &writer, CharacterForm form) const {
+  const Specials &specials = form == CharacterForm::REFERENCES ? SPECIALS_OF_REFERENCES : SPECIALS_OF_UTF8;
   MarkupOutput output(writer);
   const Node *node = this;
   while (node) {
-    WriteBegin(*node, output);
+    WriteBegin(*node, specials, output);
     if (node->GetFirstChild()) {
       node = node->GetFirstChild();
       continue;

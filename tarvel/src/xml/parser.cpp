@@ -6,6 +6,8 @@
 #include "xml/source_checks.h"
 #include "xml/tree_builder.h"
 
+#include <tarvel/core/secure_wipe.h>
+
 #include <string>
 #include <utility>
 
@@ -14,14 +16,16 @@ namespace Xml {
 
 namespace {
 
-/// The text of a document, kept where it is for as long as views into it are used.
+/// The text of a document, kept where it is for as long as views into it are used. It may hold a bearer token, and is
+/// overwritten.
 class SourceText final : public Object {
 public:
-  explicit SourceText(std::string text) noexcept : m_text(std::move(text)) {}
+  explicit SourceText(std::string &&text) noexcept : m_text(std::move(text)) {}
+  ~SourceText() override { SecureWipe(m_text); }
   std::string_view Get() const noexcept { return m_text; } // a null byte follows
 
 private:
-  const std::string m_text;
+  std::string m_text;
 };
 
 class XMLParserImpl final : public XMLParser {

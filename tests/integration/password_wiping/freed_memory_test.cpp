@@ -1,13 +1,15 @@
 // SPDX-License-Identifier: Apache-2.0
-// A password must not be left behind in the heap. This program replaces the allocation functions of C++, and looks into
+// Neither a password nor a response must be left behind in the heap. This program replaces the allocation functions of C++, and looks into
 // each piece of memory as it is given back.
 #include "compose/ws_security.h"
 #include "exchange/request_builder_impl.h"
+#include "exchange/soap_response.h"
 #include "integration/transport/service_stand_in.h"
 #include "service/wiped_text.h"
 #include "support/identity.h"
 #include "support/rendezvous.h"
 #include "support/service_stand_ins.h"
+#include "xml/parse_xml.h"
 
 #include <tarvel/core/exception.h>
 #include <tarvel/core/secure_wipe.h>
@@ -16,12 +18,18 @@
 
 #include <malloc.h>
 
+#include <algorithm>
 #include <atomic>
+#include <cstddef>
 #include <cstdlib>
 #include <cstring>
 #include <memory>
 #include <new>
+#include <optional>
+#include <sstream>
+#include <string>
 #include <string_view>
+#include <vector>
 
 namespace {
 
@@ -247,6 +255,132 @@ TEST_P(FreedMemory, HoldsNoPasswordOfARequestThatFailed) {
   EXPECT_EQ(CountFindsOfPosts(GetParam(), stall, Testing::TlsSettings(), SHORT), 0);
   EXPECT_EQ(CountFindsOfPosts(GetParam(), reset, std::nullopt, Testing::NO_TIMEOUT), 0);
   EXPECT_EQ(CountFindsOfPosts(GetParam(), reset, Testing::TlsSettings(), Testing::NO_TIMEOUT), 0);
+}
+
+enum class Reading { NOT, IN_PIECES, WHOLE, AS_XML };
+
+/// Has a service answer with these pieces, which outlive it, and counts the copies that this process leaves in freed memory.
+int CountFindsOfAnswers(const char *secret, const std::vector<std::string> &pieces,
+                        const std::optional<Testing::TlsSettings> &tls, Reading reading) {
+  const auto script = [&pieces](Testing::ServerConnection &connection) {
+    connection.ShakeHands();
+    connection.ReadRequest();
+    for (const std::string &piece : pieces) {
+      connection.Write(piece);
+    }
+  };
+  Testing::ServiceStandIn service(script, tls);
+  const Watch watch(secret);
+  try {
+    Tarvel::Ref<Tarvel::Reader> response;
+    service.CreateSession()->SendRequest(Testing::SampleRequest(), response);
+    if (reading == Reading::IN_PIECES) {
+      char buffer[7];
+      while (response->Read(buffer, sizeof buffer) > 0) {
+      }
+    }
+    if (reading == Reading::WHOLE) {
+      std::string text = response->ReadToEnd(Tarvel::Http::MAX_BODY_BYTES);
+      EXPECT_NE(text.find(secret), std::string::npos);
+      Tarvel::SecureWipe(text);
+    }
+    if (reading == Reading::AS_XML) {
+      EXPECT_THROW(CheckSoapFault(*ParseResponseDocument(*response)), SsoException);
+    }
+  } catch (const CommunicationException &) { // for the bad ones; NOLINT(bugprone-empty-catch)
+  }
+  EXPECT_TRUE(Testing::DrainIoThreads());
+  return watch.Found();
+}
+
+/// The secret in a SOAP message that is longer than any text keeps in itself, between a lot else or not.
+std::string AnswerWithSecret(const char *secret, std::size_t padding) {
+  return "<e:Envelope xmlns:e=\"http://schemas.xmlsoap.org/soap/envelope/\"><!--" + std::string(padding, 'x') +
+         "--><e:Body><e:Fault><faultcode>e:Server</faultcode><detail>" + secret + "</detail></e:Fault></e:Body><!--" +
+         std::string(padding, 'x') + "--></e:Envelope>";
+}
+
+std::vector<std::string> InPieces(const std::string &bytes, std::size_t length) {
+  std::vector<std::string> pieces;
+  for (std::size_t at = 0; at < bytes.size(); at += length) {
+    pieces.push_back(bytes.substr(at, length));
+  }
+  return pieces;
+}
+
+std::string InChunks(const std::string &body, std::size_t length) {
+  std::ostringstream chunks;
+  for (const std::string &piece : InPieces(body, length)) {
+    chunks << std::hex << piece.size() << "\r\n" << piece << "\r\n";
+  }
+  return chunks.str() + "0\r\n\r\n";
+}
+
+TEST_P(FreedMemory, HoldsNothingOfAResponse) {
+  const std::string ok = "HTTP/1.1 200 OK\r\n";
+  for (const std::size_t padding : {std::size_t(0), std::size_t(200000)}) {
+    const std::string body = AnswerWithSecret(GetParam(), padding);
+    const std::size_t pieceLength = padding / 3 + 1000;
+    for (const std::string &bytes :
+         {ok + "Content-Length: " + std::to_string(body.size()) + "\r\n\r\n" + body, ok + "\r\n" + body,
+          ok + "Transfer-Encoding: chunked\r\n\r\n" + InChunks(body, 5000),
+          ok + "Content-Type: text/xml;charset=latin1\r\n\r\n<?xml version='1.0' encoding='latin1'?>" + body,
+          ok + "Content-Type: text/xml;charset=latin1\r\n\r\n" + body + "<!--\xFC-->"}) {
+      const std::vector<std::string> pieces = InPieces(bytes, pieceLength);
+      for (const Reading reading : {Reading::NOT, Reading::IN_PIECES, Reading::WHOLE, Reading::AS_XML}) {
+        EXPECT_EQ(CountFindsOfAnswers(GetParam(), pieces, std::nullopt, reading), 0);
+        EXPECT_EQ(CountFindsOfAnswers(GetParam(), pieces, Testing::TlsSettings(), reading), 0);
+      }
+    }
+  }
+}
+
+TEST_P(FreedMemory, HoldsNothingOfAResponseThatIsRefused) {
+  const std::string body = AnswerWithSecret(GetParam(), 0);
+  for (const std::string &bytes :
+       {"HTTP/1.1 503 Down\r\n\r\n" + body, "HTTP/1.1 200 OK\r\nContent-Length: 100000\r\n\r\n" + body,
+        "HTTP/1.1 200 OK\r\nContent-Length: many\r\n\r\n" + body,
+        "HTTP/1.1 200 OK\r\nTransfer-Encoding: chunked\r\n\r\n" + InChunks(body, 100).substr(0, body.size()),
+        "HTTP/1.1 200 OK\r\nContent-Encoding: gzip\r\n\r\n" + body, body}) {
+    for (const std::size_t length : {std::size_t(100000), std::size_t(20)}) {
+      const std::vector<std::string> pieces = InPieces(bytes, length);
+      EXPECT_EQ(CountFindsOfAnswers(GetParam(), pieces, std::nullopt, Reading::NOT), 0) << bytes;
+      EXPECT_EQ(CountFindsOfAnswers(GetParam(), pieces, Testing::TlsSettings(), Reading::NOT), 0) << bytes;
+    }
+  }
+}
+
+/// Gives the text away in pieces, as a file does.
+class PieceReader final : public Tarvel::Reader {
+public:
+  explicit PieceReader(const std::string &text) : m_text(text) {}
+  std::size_t Read(char *buffer, std::size_t length) override {
+    const std::size_t count = m_text.copy(buffer, std::min<std::size_t>(length, 1000), m_position);
+    m_position += count;
+    return count;
+  }
+
+private:
+  const std::string &m_text;
+  std::size_t m_position = 0;
+};
+
+TEST_P(FreedMemory, HoldsNothingOfATextThatWasReadOrParsed) {
+  for (const std::size_t padding : {std::size_t(0), std::size_t(200000)}) {
+    const std::string text = AnswerWithSecret(GetParam(), padding);
+    const Watch watch(GetParam());
+    Tarvel::CreateStringReader(text);
+    char buffer[7];
+    Tarvel::CreateStringReader(text)->Read(buffer, sizeof buffer);
+    Tarvel::SecureWipe(buffer, sizeof buffer);
+    std::string read = Tarvel::MakeRef<PieceReader>(text)->ReadToEnd(text.size());
+    EXPECT_EQ(read, text);
+    Tarvel::SecureWipe(read);
+    Tarvel::Ref<Tarvel::Xml::Document> document;
+    ParseXML(text, document);
+    document.reset();
+    EXPECT_EQ(watch.Found(), 0);
+  }
 }
 
 INSTANTIATE_TEST_SUITE_P(LongAndShort, FreedMemory, testing::Values(LONG_PASSWORD, SHORT_PASSWORD),

@@ -8,6 +8,8 @@
 
 #include <gtest/gtest.h>
 
+#include <algorithm>
+
 namespace SsoClient {
 namespace {
 
@@ -70,6 +72,15 @@ TEST_P(TextField, SurvivesTheRoundTrip) {
     ASSERT_EQ(values.size(), 2u);
     EXPECT_EQ(TextOf(values[0]), text);
     EXPECT_EQ(TextOf(values[1]), text);
+  }
+}
+
+TEST_P(TextField, IsWrittenInAscii) {
+  for (const std::string &text : TEXTS) {
+    Request request;
+    m_builder.BuildUserPassTokenRequest(text, text, SpecWith(text), request);
+    const auto isBeyondAscii = [](char c) { return static_cast<unsigned char>(c) > 0x7F; };
+    EXPECT_TRUE(std::none_of(request.body.begin(), request.body.end(), isBeyondAscii)) << text;
   }
 }
 

@@ -11,9 +11,13 @@
 
 #include <gtest/gtest.h>
 
+#include <functional>
 #include <future>
 #include <memory>
+#include <new>
+#include <stdexcept>
 #include <string>
+#include <utility>
 
 namespace SsoClient {
 namespace {
@@ -127,6 +131,44 @@ TEST(SsoConnectionSpec, FailsEachConnectionWithoutAContext) {
   const Connected connected = Connect(Tls("localhost", server.GetPort(), nullptr));
   EXPECT_EQ(connected.failure, "Invalid argument : an SSL connection needs an SSLContext.");
   connected.stream->Close();
+}
+
+/// Has something else to throw where a TLS stream is made.
+class ThrowingContext final : public Tarvel::Ssl::SSLContext {
+public:
+  explicit ThrowingContext(std::function<void()> raise) : m_raise(std::move(raise)) {}
+  void TrustSystemStore() override {}
+  void TrustFile(const std::string &) override {}
+  void TrustCertificates(const Tarvel::Crypto::CertificateList &) override {}
+  void SetClientCertificate(const Ref<const Tarvel::Crypto::Certificate> &,
+                            const Ref<const Tarvel::Crypto::PrivateKey> &,
+                            const Tarvel::Crypto::CertificateList &) override {}
+  Ref<Tarvel::Ssl::SSLStream> CreateStream(const Ref<Tarvel::System::Stream> &, const std::string &) override {
+    m_raise();
+    return nullptr;
+  }
+
+private:
+  const std::function<void()> m_raise;
+};
+
+TEST(SsoConnectionSpec, CallsItsCompletionForWhateverIsThrownBetweenConnectAndHandshake) {
+  ScriptedServer server([](ServerConnection &connection) { connection.Stall(); });
+  const std::string foreign = "The connection to localhost:" + std::to_string(server.GetPort()) + " failed: ";
+  struct Case {
+    std::function<void()> raise;
+    std::string failure;
+  };
+  for (const Case &thrown : {Case{[] { throw std::bad_alloc(); }, "Out of memory"},
+                             Case{[] { throw std::runtime_error("foreign"); }, foreign + "foreign"},
+                             Case{[] { throw 42; }, foreign + "an object that is not an exception was thrown"},
+                             Case{[] { throw Tarvel::Ssl::SSLException("of the platform"); }, "of the platform"}}) {
+    const Connected connected =
+        Connect(Tls("localhost", server.GetPort(), Tarvel::MakeRef<ThrowingContext>(thrown.raise)));
+    EXPECT_EQ(connected.failure, thrown.failure);
+    ASSERT_TRUE(connected.stream);
+    connected.stream->Close();
+  }
 }
 
 TEST(SsoConnectionSpec, CancelsTheConnectAndTheHandshake) {

@@ -82,6 +82,16 @@ ScriptedServer::Script SendAndReset(const std::string &bytes) {
   };
 }
 
+/// The same, and leaves the connection open.
+ScriptedServer::Script SendAndStall(const std::string &bytes) {
+  return [bytes](ServerConnection &connection) {
+    connection.ShakeHands();
+    connection.ReadRequest();
+    connection.Write(bytes);
+    connection.Stall();
+  };
+}
+
 /// Sends the same again and again until the client has had enough.
 ScriptedServer::Script SendWithoutEnd(const std::string &start, const std::string &repeated) {
   return [start, repeated](ServerConnection &connection) {
@@ -102,7 +112,6 @@ const Fault MISBEHAVIOUR[] = {
     {"EndWithinTheHeader", Send("HTTP/1.1 200 OK\r\nContent-"), BAD + "the connection ended within its header"},
     {"EndWithinTheBody", Send(LENGTH_5 + "hell"), BAD + "the connection ended after 4 of the body's 5 bytes"},
     {"EndWithinTheChunks", Send(CHUNKED + "5\r\nhello\r\n"), BAD + "the connection ended within the chunked body"},
-    {"BodyBeyondItsLength", Send(LENGTH_5 + "hello, world"), BAD + "it goes on after its end"},
     {"LengthBesideChunks", Send(OK + "Content-Length: 5\r\nTransfer-Encoding: chunked\r\n\r\n0\r\n\r\n"),
      BAD + "its header is not HTTP/1.x (bad Transfer-Encoding)"},
     {"ContradictingLengths", Send(OK + "Content-Length: 5\r\nContent-Length: 4\r\n\r\nhello"),
@@ -130,6 +139,19 @@ const Fault MISBEHAVIOUR[] = {
     {"BannerOfAnotherProtocol", Send("220 mail.example ESMTP\r\n"), BAD + "its header is not HTTP/1.x (bad version)"},
     {"RefusedStatus", Send("HTTP/1.1 404 Not Found\r\nContent-Length: 4\r\n\r\nnone"),
      "Server returned error: 404 Not Found"},
+    {"RefusedStatusWithEncodedPage", Send("HTTP/1.1 503 Down\r\nContent-Encoding: gzip\r\nContent-Length: 1\r\n\r\nx"),
+     "Server returned error: 503 Down"},
+    {"RefusedStatusWithCutPage", Send("HTTP/1.1 503 Down\r\nContent-Length: 100\r\n\r\ncut"),
+     "Server returned error: 503 Down"},
+    {"RefusedStatusWithStalledPage", SendAndStall("HTTP/1.1 503 Down\r\nContent-Length: 100\r\n\r\n"),
+     "Server returned error: 503 Down"},
+    {"RefusedStatusWithOddFraming", Send("HTTP/1.1 503 Down\r\nContent-Length: many\r\n\r\nx"),
+     "Server returned error: 503 Down"},
+    {"RefusedStatusWithEndlessPage", SendWithoutEnd("HTTP/1.1 503 Down\r\n\r\n", std::string(65536, 'x')),
+     "Server returned error: 503 Down"},
+    {"RefusedStatusWithoutAReason", Send("HTTP/1.1 404 \r\nContent-Length: 0\r\n\r\n"), "Server returned error: 404 "},
+    {"RefusedStatusWithoutTheLastBlank", Send("HTTP/1.1 503\r\n\r\n"), "Server returned error: 503 "},
+    {"EndAfterAnInterimResponse", Send("HTTP/1.1 100 Continue\r\n\r\n"), BAD + "the connection ended before it"},
     {"Redirect", Send("HTTP/1.1 302 Found\r\nLocation: http://127.0.0.1:1/\r\nContent-Length: 0\r\n\r\n"),
      "Server returned error: 302 Found"},
 };
@@ -195,6 +217,21 @@ INSTANTIATE_TEST_SUITE_P(
               },
               "The TLS handshake with localhost failed: error:0A00010B:SSL routines::wrong version number"}),
     NameOf);
+
+TEST(TransportBytesAfterTheEnd, AreIgnoredHoweverTheyArePacked) {
+  const auto inTwoPieces = [](ServerConnection &connection) {
+    connection.ShakeHands();
+    connection.ReadRequest();
+    connection.Write(LENGTH_5 + "hello");
+    connection.Write(", world");
+  };
+  for (const std::optional<TlsSettings> &tls : {std::optional<TlsSettings>(), std::optional(TlsSettings())}) {
+    ServiceStandIn inOne(Send(LENGTH_5 + "hello, world"), tls);
+    EXPECT_EQ(AskForOutcome(*inOne.CreateSession()), "hello");
+    ServiceStandIn inTwo(inTwoPieces, tls);
+    EXPECT_EQ(AskForOutcome(*inTwo.CreateSession()), "hello");
+  }
+}
 
 TEST(TransportOverTlsWithoutNotice, TakesAResponseThatIsWholeByItsLength) {
   ServiceStandIn service(SendAndEndWithoutNotice(LENGTH_5 + "hello"), TlsSettings());

@@ -2,8 +2,10 @@
 
 #include "transport/https_session.h"
 
+#include "exchange/soap_response.h"
 #include "integration/transport/service_stand_in.h"
 #include "support/throws_message.h"
+#include "xml/node_text.h"
 
 #include <tarvel/core/exception.h>
 #include <tarvel/http/url.h>
@@ -129,6 +131,58 @@ TEST(HttpsSession, NamesCodeAndReasonOfEveryOtherStatus) {
     ServiceStandIn service(AnswerWith("HTTP/1.1 " + status + "\r\nLocation: /elsewhere\r\nContent-Length: 0\r\n\r\n"));
     EXPECT_EQ(AskForOutcome(*service.CreateSession()), Failure("Server returned error: " + status));
     EXPECT_EQ(service.GetServer().GetConnectionCount(), 1);
+  }
+}
+
+const char LATIN1[] = "Content-Type: text/xml; charset=\"ISO-8859-1\"\r\n";
+const char DECLARATION[] = "<?xml version=\"1.0\" encoding=\"ISO-8859-1\"?>";
+
+/// The name of the document's root and its text, or what was thrown.
+std::string ReadDocument(const std::string &response) {
+  ServiceStandIn service(AnswerWith(response));
+  try {
+    Ref<Tarvel::Reader> reader;
+    service.CreateSession()->SendRequest(SampleRequest(), reader);
+    const auto root = ParseResponseDocument(*reader);
+    return std::string(root->GetName()) + ": " + GetText(GetTextNode(root.get()));
+  } catch (const Tarvel::Exception &exception) {
+    return exception.what();
+  }
+}
+
+TEST(HttpsSession, HandsOnADocumentOfLatin1ThatCanBeParsed) {
+  for (const std::string &start : {std::string(), std::string(DECLARATION)}) {
+    EXPECT_EQ(ReadDocument(Response("200 OK", start + "<a>\xFC</a>", LATIN1)), "a: \xC3\xBC");
+    EXPECT_EQ(ReadDocument(Response("500 Fault", start + "<a>u</a>", LATIN1)), "a: u");
+  }
+}
+
+TEST(HttpsSession, NamesTheCharsetOfADocumentThatCannotBeParsed) {
+  const std::string refusal = "Response is not well-formed XML: ";
+  for (const char *const charset : {"windows-1252", "us-ascii"}) {
+    EXPECT_EQ(ReadDocument(
+                  Response("200 OK", "<a>\xFC</a>", std::string("Content-Type: text/xml;charset=") + charset + "\r\n")),
+              refusal + "the document is not UTF-8 at line 1, column 4 (charset " + charset + ")");
+  }
+  EXPECT_EQ(ReadDocument(Response("200 OK", "<a>\xFC</a>", "Content-Type: text/xml;charset=utf-8\r\n")),
+            refusal + "the document is not UTF-8 at line 1, column 4");
+  EXPECT_EQ(ReadDocument(Response("200 OK", "<a>\xFC</a>")), refusal + "the document is not UTF-8 at line 1, column 4");
+  EXPECT_EQ(ReadDocument(Response("200 OK", std::string(DECLARATION) + "<a>\xC3\xBC</a>", LATIN1)),
+            refusal + "the encoding 'ISO-8859-1' is declared, only UTF-8 is accepted at line 1, column 31 "
+                      "(charset ISO-8859-1)");
+}
+
+TEST(HttpsSession, LeavesTheLengthOfWhatBecameLongerAsUtf8ToTheParser) {
+  const std::string body(Tarvel::Http::MAX_BODY_BYTES, '\xFC');
+  EXPECT_EQ(ReadDocument(Response("200 OK", body, LATIN1)),
+            "Response is not well-formed XML: the document is longer than 16777216 bytes at line 1, column 16777217 "
+            "(charset ISO-8859-1)");
+}
+
+TEST(HttpsSession, LetsTheStatusDecideBeforeTheCharset) {
+  for (const char *const charset : {"ISO-8859-1", "windows-1252"}) {
+    const std::string type = std::string("Content-Type: text/html;charset=") + charset + "\r\n";
+    EXPECT_EQ(ReadDocument(Response("503 Down", "<a>\xFC</a>", type)), "Server returned error: 503 Down");
   }
 }
 

@@ -95,7 +95,7 @@ TEST(AcquireSecurityTokenBuilder, SortsAudiencesByTheirBytes) {
   spec.audienceRestriction = {"urn:b", "urn:\xC3\xA4", "urn:B", "urn:a"};
   const std::string request = SerializeToXML(AcquireSecurityTokenBuilder(SamlToken::BEARER, spec));
   std::vector<std::size_t> places;
-  for (const char *audience : {">urn:B<", ">urn:a<", ">urn:b<", ">urn:\xC3\xA4<"}) {
+  for (const char *audience : {">urn:B<", ">urn:a<", ">urn:b<", ">urn:&#xE4;<"}) {
     places.push_back(request.find(audience));
   }
   EXPECT_TRUE(std::is_sorted(places.begin(), places.end()));

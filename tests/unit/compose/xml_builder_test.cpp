@@ -2,6 +2,7 @@
 #include "compose/xml_builder.h"
 
 #include "support/throws_message.h"
+#include "xml/parse_xml.h"
 
 #include <tarvel/core/exception.h>
 
@@ -120,6 +121,18 @@ TEST(ElementDefineAttribute, DefinesTheAttributeByItsQualifiedName) {
   ElementDefineAttribute(element.get(), {"p:a", "v"});
   ASSERT_NE(element->FindAttribute("urn:p", "a"), nullptr);
   EXPECT_EQ(element->FindAttribute("urn:p", "a")->GetValue(), "v");
+}
+
+TEST(SerializeToXML, WritesTextAndAttributeValuesInAscii) {
+  const XMLBuilderPtr builder = TextElementBuilder("p", "e", {{"a", "ü<"}}, "łx語\xF0\x9F\x98\x80&");
+  EXPECT_EQ(SerializeToXML(builder), "<p:e a=\"&#xFC;&lt;\">&#x142;x&#x8A9E;&#x1F600;&amp;</p:e>");
+}
+
+TEST(SerializeToXML, LeavesWhatCannotBeAReferenceInAPreBuiltElementAsItIs) {
+  Tarvel::Ref<Tarvel::Xml::Document> document;
+  ParseXML("<ü><!--ü-->ü</ü>", document);
+  const Tarvel::Ref<Tarvel::Xml::ElementNode> root(document->GetDocumentElement());
+  EXPECT_EQ(SerializeToXML(std::make_shared<const PreBuiltElementImpl>(root)), "<ü><!--ü-->&#xFC;</ü>");
 }
 
 /// Texts that an XML 1.0 document has no way to carry, escaped or not.

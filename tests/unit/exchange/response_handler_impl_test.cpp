@@ -1,6 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "exchange/response_handler_impl.h"
 
+#include "exchange/soap_response.h"
 #include "support/soap_responses.h"
 #include "support/throws_message.h"
 
@@ -11,10 +12,12 @@
 
 #include <gtest/gtest.h>
 
+#include <cstddef>
 #include <cstdint>
 #include <functional>
 #include <ostream>
 #include <string>
+#include <utility>
 #include <vector>
 
 namespace SsoClient {
@@ -90,6 +93,38 @@ TEST_P(EachResponse, IsRefusedWithTheParsersMessageWhenItIsNotXml) {
   EXPECT_THROWS_MESSAGE(
       Handle("<!DOCTYPE a><a/>"), SsoException,
       "Response is not well-formed XML: a document type declaration is not accepted at line 1, column 1");
+}
+
+/// A text with a charset that somebody declared for it.
+class DeclaredReader final : public Tarvel::Reader {
+public:
+  DeclaredReader(const std::string &text, std::string charset)
+      : m_text(Tarvel::CreateStringReader(text)), m_charset(std::move(charset)) {}
+  std::size_t Read(char *buffer, std::size_t length) override { return m_text->Read(buffer, length); }
+  std::string GetDeclaredCharset() const override { return m_charset; }
+
+private:
+  const Tarvel::Ref<Tarvel::Reader> m_text;
+  const std::string m_charset;
+};
+
+TEST(ParseResponseDocument, SaysWhichCharsetWasDeclaredForWhatIsNotXml) {
+  const std::string refusal = "Response is not well-formed XML: the document is not UTF-8 at line 1, column 4";
+  struct Case {
+    const char *charset;
+    std::string message;
+  };
+  for (const Case &declared :
+       {Case{"windows-1252", refusal + " (charset windows-1252)"}, Case{"US-ASCII", refusal + " (charset US-ASCII)"},
+        Case{"utf-8", refusal}, Case{"UTF-8", refusal}, Case{"Utf8", refusal}, Case{"", refusal}}) {
+    EXPECT_THROWS_MESSAGE(ParseResponseDocument(*Tarvel::MakeRef<DeclaredReader>("<a>\xFC</a>", declared.charset)),
+                          SsoException, declared.message);
+  }
+}
+
+TEST(ParseResponseDocument, DoesNotMindTheCharsetOfWhatIsXml) {
+  const auto document = ParseResponseDocument(*Tarvel::MakeRef<DeclaredReader>("<a/>", "windows-1252"));
+  EXPECT_EQ(document->GetName(), "a");
 }
 
 TEST_P(EachResponse, IsRefusedWithoutBodyWhateverElseItHolds) {

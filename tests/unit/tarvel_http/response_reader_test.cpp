@@ -51,6 +51,14 @@ TEST_P(ResponseReaderAccepts, InPiecesOfAnyLength) {
   }
 }
 
+std::string Repeat(const std::string &text, int times) {
+  std::string all;
+  for (int i = 0; i < times; ++i) {
+    all += text;
+  }
+  return all;
+}
+
 const std::string OK = "HTTP/1.1 200 OK\r\n";
 const std::string CHUNKED = OK + "Transfer-Encoding: chunked\r\n\r\n";
 const std::string LENGTH_5 = OK + "Content-Length: 5\r\n\r\n";
@@ -85,6 +93,9 @@ INSTANTIATE_TEST_SUITE_P(
                     GoodResponse{"HTTP/1.1 204 No Content\r\nContent-Length: 5\r\n\r\n", 204, "No Content", ""},
                     GoodResponse{"HTTP/1.1 304 Not Modified\r\nContent-Length: 5\r\n\r\n", 304, "Not Modified", ""},
                     GoodResponse{"HTTP/1.1 404 \r\nContent-Length: 0\r\n\r\n", 404, "", ""},
+                    GoodResponse{"HTTP/1.1 503\r\nContent-Length: 0\r\n\r\n", 503, "", ""},
+                    GoodResponse{"HTTP/1.0 200\r\nContent-Length: 2\r\n\r\nok", 200, "", "ok"},
+                    GoodResponse{"HTTP/1.1 100\r\n\r\nHTTP/1.1 200\r\nContent-Length: 2\r\n\r\nok", 200, "", "ok"},
                     GoodResponse{"HTTP/1.1 500 Internal Server Error\r\nContent-Length: 1\r\n\r\nx", 500,
                                  "Internal Server Error", "x"},
                     GoodResponse{"HTTP/1.1 999 Odd\r\nContent-Length: 0\r\n\r\n", 999, "Odd", ""},
@@ -94,9 +105,34 @@ INSTANTIATE_TEST_SUITE_P(
                     GoodResponse{"HTTP/1.1 100 Continue\r\n\r\nHTTP/1.1 103 Early Hints\r\nLink: x\r\n\r\n"
                                  "HTTP/1.1 404 Not Found\r\nContent-Length: 0\r\n\r\n",
                                  404, "Not Found", ""},
+                    GoodResponse{Repeat("HTTP/1.1 100 Continue\r\n\r\n", 16) + LENGTH_5 + "hello", 200, "OK", "hello"},
                     GoodResponse{OK + "Content-Encoding: identity\r\nContent-Length: 1\r\n\r\nx", 200, "OK", "x"},
                     GoodResponse{OK + "Content-Encoding:\r\nContent-Length: 1\r\n\r\nx", 200, "OK", "x"},
                     GoodResponse{OK + "Content-Encoding: gzip\r\nContent-Length: 0\r\n\r\n", 200, "OK", ""}));
+
+// What follows a status other than 2xx and 500 does not count, and what says how it would be read does not either.
+INSTANTIATE_TEST_SUITE_P(
+    RefusedStatuses, ResponseReaderAccepts,
+    testing::Values(
+        GoodResponse{"HTTP/1.1 404 Not Found\r\nContent-Length: 4\r\n\r\nnone", 404, "Not Found", ""},
+        GoodResponse{"HTTP/1.1 404 Not Found\r\nContent-Encoding: deflate\r\nContent-Length: 1\r\n\r\nx", 404,
+                     "Not Found", ""},
+        GoodResponse{"HTTP/1.1 503 Service Unavailable\r\nContent-Length: 100\r\n\r\ncut", 503, "Service Unavailable",
+                     ""},
+        GoodResponse{"HTTP/1.1 503 Down\r\nContent-Length: 17000000\r\n\r\nx", 503, "Down", ""},
+        GoodResponse{"HTTP/1.1 503 Down\r\nTransfer-Encoding: gzip, chunked\r\n\r\nx", 503, "Down", ""},
+        GoodResponse{"HTTP/1.1 503 Down\r\nTransfer-Encoding: chunked\r\n\r\nno chunk", 503, "Down", ""},
+        GoodResponse{"HTTP/1.1 503 Down\r\nTransfer-Encoding: identity\r\nContent-Length: 1\r\n\r\nx", 503, "Down", ""},
+        GoodResponse{"HTTP/1.0 503 Down\r\nTransfer-Encoding: chunked\r\n\r\n", 503, "Down", ""},
+        GoodResponse{"HTTP/1.1 503 Down\r\nContent-Length: many\r\n\r\nx", 503, "Down", ""},
+        GoodResponse{"HTTP/1.1 503 Down\r\nContent-Length: 1\r\nContent-Length: 2\r\n\r\nx", 503, "Down", ""},
+        GoodResponse{"HTTP/1.1 503 Down\r\nContent-Length: 1\r\nTransfer-Encoding: chunked\r\n\r\nx", 503, "Down", ""},
+        GoodResponse{"HTTP/1.1 304 Not Modified\r\nContent-Length: many\r\n\r\n", 304, "Not Modified", ""},
+        GoodResponse{"HTTP/1.1 301 Moved\r\n\r\nto the end", 301, "Moved", ""},
+        GoodResponse{"HTTP/1.1 501 Not Implemented\r\nContent-Length: 1\r\n\r\n", 501, "Not Implemented", ""},
+        GoodResponse{"HTTP/1.1 499 \r\nContent-Length: 1\r\n\r\n", 499, "", ""},
+        GoodResponse{"HTTP/1.1 100 Continue\r\n\r\nHTTP/1.1 503 Down\r\nContent-Length: many\r\n\r\n", 503, "Down",
+                     ""}));
 
 struct BadResponse {
   std::string bytes;
@@ -127,7 +163,15 @@ INSTANTIATE_TEST_SUITE_P(
     testing::Values(BadResponse{"", "the connection ended before it"}, BadResponse{"H", IN_HEADER},
                     BadResponse{"HTTP/1.1 200 OK", IN_HEADER}, BadResponse{"HTTP/1.1 200 OK\r\n", IN_HEADER},
                     BadResponse{"HTTP/1.1 200 OK\r\nContent-Length: 5\r\n", IN_HEADER},
-                    BadResponse{"HTTP/1.1 100 Continue\r\n\r\n", IN_HEADER},
+                    BadResponse{"HTTP/1.1 100 Continue\r\n\r\n", "the connection ended before it"},
+                    BadResponse{"HTTP/1.1 100 Continue\r\n\r\nH", IN_HEADER}, BadResponse{"HTTP/1.1 503", IN_HEADER},
+                    BadResponse{"HTTP/1.1 503\r\n", IN_HEADER},
+                    BadResponse{"HTTP/1.1 503 Down\r\nContent-Length: 5\r\n", IN_HEADER},
+                    BadResponse{"HTTP/1.1 503 Down\r\nContent-Length: many\r\n", IN_HEADER},
+                    BadResponse{"HTTP/1.1 503 Down\r\nNo colon\r\n\r\n", NoHttp("bad field")},
+                    BadResponse{"HTTP/1.1 100 Continue\r\nContent-Length: many\r\n\r\n", NoHttp("bad Content-Length")},
+                    BadResponse{"HTTP/1.1 20\r\n\r\n", NoHttp("bad status")},
+                    BadResponse{"HTTP/1.1 503\n\r\n\r\n", NoHttp("bad status")},
                     BadResponse{"SSH-2.0-OpenSSH_9.2p1\r\n", NoHttp("bad version")},
                     BadResponse{"HTTP/2.0 200 OK\r\n\r\n", NoHttp("bad version")},
                     BadResponse{"HTTP/0.9 200 OK\r\n\r\n", NoHttp("bad version")},
@@ -222,24 +266,18 @@ INSTANTIATE_TEST_SUITE_P(
         BadResponse{CHUNKED + "0\r\n" + std::string(65537, 'x'),
                     "the extensions and the trailer of the chunked body are longer than 65536 bytes"}));
 
-std::string Repeat(const std::string &text, int times) {
-  std::string all;
-  for (int i = 0; i < times; ++i) {
-    all += text;
-  }
-  return all;
-}
-
 const std::string HEADER_LIMIT = "the header is longer than 65536 bytes";
 
 INSTANTIATE_TEST_SUITE_P(
     Limits, ResponseReaderRefuses,
-    testing::Values(
-        BadResponse{OK + "A: " + std::string(65536, 'x') + "\r\n\r\n", HEADER_LIMIT},
-        BadResponse{OK + Repeat("A: b\r\n", 20000) + "\r\n", HEADER_LIMIT},
-        BadResponse{"HTTP/1.1 200 " + std::string(65536, 'x') + "\r\n\r\n", HEADER_LIMIT},
-        BadResponse{Repeat("HTTP/1.1 100 Continue\r\n\r\n", 17), "it follows more than 16 interim responses"},
-        BadResponse{Repeat("HTTP/1.1 100 Continue\r\nA: " + std::string(10000, 'x') + "\r\n\r\n", 8), HEADER_LIMIT}));
+    testing::Values(BadResponse{OK + "A: " + std::string(65536, 'x') + "\r\n\r\n", HEADER_LIMIT},
+                    BadResponse{OK + Repeat("A: b\r\n", 20000) + "\r\n", HEADER_LIMIT},
+                    BadResponse{"HTTP/1.1 200 " + std::string(65536, 'x') + "\r\n\r\n", HEADER_LIMIT},
+                    BadResponse{Repeat("HTTP/1.1 100 Continue\r\n\r\n", 17),
+                                "it follows more than 16 interim responses"},
+                    BadResponse{"HTTP/1.1 100 Continue\r\nA: " + std::string(65536, 'x') + "\r\n\r\n", HEADER_LIMIT},
+                    BadResponse{"HTTP/1.1 100 Continue\r\n\r\n" + OK + "A: " + std::string(65536, 'x') + "\r\n\r\n",
+                                HEADER_LIMIT}));
 
 INSTANTIATE_TEST_SUITE_P(
     Encodings, ResponseReaderRefuses,
@@ -247,17 +285,57 @@ INSTANTIATE_TEST_SUITE_P(
                                 "its content (status 200 OK) is encoded as \"gzip\", which was not asked for"},
                     BadResponse{OK + "content-encoding: br\r\nTransfer-Encoding: chunked\r\n\r\n0\r\n\r\n",
                                 "its content (status 200 OK) is encoded as \"br\", which was not asked for"},
-                    BadResponse{
-                        "HTTP/1.1 404 Not Found\r\nContent-Encoding: deflate\r\nContent-Length: 1\r\n\r\nx",
-                        "its content (status 404 Not Found) is encoded as \"deflate\", which was not asked for"}));
+                    BadResponse{"HTTP/1.1 500 Oh\r\nContent-Encoding: deflate\r\nContent-Length: 1\r\n\r\nx",
+                                "its content (status 500 Oh) is encoded as \"deflate\", which was not asked for"}));
 
-TEST(ResponseReader, RefusesBytesAfterTheEndAsFarAsTheyHaveCome) {
-  for (const std::string &bytes :
-       {LENGTH_5 + "hello!", std::string("HTTP/1.1 204 No Content\r\n\r\nhello"), CHUNKED + "0\r\n\r\nx",
-        LENGTH_5 + "hello" + LENGTH_5 + "world", OK + "Content-Length: 0\r\n\r\nx"}) {
-    ResponseReader reader;
-    EXPECT_THROWS_MESSAGE(reader.Put(bytes), HttpException, "it goes on after its end") << bytes;
+TEST(ResponseReader, IgnoresBytesAfterTheEndHoweverTheyArePacked) {
+  const std::string noContent = "HTTP/1.1 204 No Content\r\n\r\n";
+  const std::string refused = "HTTP/1.1 404 Not Found\r\nContent-Length: 4\r\n\r\n";
+  struct Case {
+    std::string response;
+    std::string body;
+  };
+  for (const Case &whole : {Case{LENGTH_5 + "hello", "hello"}, Case{noContent, ""}, Case{CHUNKED + "0\r\n\r\n", ""},
+                            Case{OK + "Content-Length: 0\r\n\r\n", ""}, Case{refused, ""}}) {
+    for (const std::string &rest :
+         {std::string("\r\n"), std::string("x"), LENGTH_5 + "world", std::string(70000, 'x')}) {
+      EXPECT_EQ(ReadWhole(whole.response + rest, WHOLE).body, whole.body) << whole.response;
+      EXPECT_EQ(ReadWhole(whole.response + rest, 1).body, whole.body) << whole.response;
+      EXPECT_EQ(ReadWhole(whole.response + rest, whole.response.size()).body, whole.body) << whole.response;
+    }
   }
+}
+
+TEST(ResponseReader, IsCompleteAtTheEndOfTheHeaderOfARefusedStatus) {
+  for (const std::string &header : {std::string("HTTP/1.1 503 Down\r\nContent-Length: 5\r\n\r\n"),
+                                    std::string("HTTP/1.1 404\r\nTransfer-Encoding: chunked\r\n\r\n"),
+                                    std::string("HTTP/1.1 301 Moved\r\nContent-Length: -1\r\n\r\n")}) {
+    ResponseReader reader;
+    reader.Put(header.substr(0, header.size() - 1));
+    EXPECT_FALSE(reader.IsComplete());
+    reader.Put("\n");
+    EXPECT_TRUE(reader.IsComplete());
+  }
+}
+
+TEST(ResponseReader, KeepsTheFieldsOfARefusedStatusUpToOneThatStatesNoLength) {
+  const HeaderFields all{{"Retry-After", "5"}, {"Content-Length", "70000000"}, {"Set-Cookie", "a=b"}};
+  EXPECT_EQ(
+      ReadWhole("HTTP/1.1 503 Down\r\nRetry-After: 5\r\nContent-Length: 70000000\r\nSet-Cookie: a=b\r\n\r\n", WHOLE)
+          .fields,
+      all);
+  const HeaderFields some{{"Retry-After", "5"}};
+  EXPECT_EQ(
+      ReadWhole("HTTP/1.1 503 Down\r\nRetry-After: 5\r\nContent-Length: many\r\nSet-Cookie: a=b\r\n\r\n", WHOLE).fields,
+      some);
+}
+
+TEST(ResponseReader, CountsTheHeaderOfEachInterimResponseByItself) {
+  const std::string start = "HTTP/1.1 103 Early Hints\r\nA: ";
+  const std::string interim = start + std::string(MAX_HEADER_BYTES - start.size() - 4, 'x') + "\r\n\r\n";
+  const std::string finalStart = OK + "Content-Length: 5\r\nA: ";
+  const std::string header = finalStart + std::string(MAX_HEADER_BYTES - finalStart.size() - 4, 'x') + "\r\n\r\n";
+  EXPECT_EQ(ReadWhole(Repeat(interim, 16) + header + "hello", 16384).body, "hello");
 }
 
 TEST(ResponseReader, NeverTakesAPrefixOfAResponseWithALengthForTheWhole) {

@@ -55,6 +55,41 @@ TEST(WriteTo, WritesMoreThanItsBufferHolds) {
   EXPECT_TRUE(WriteAgain(text) == text);
 }
 
+std::string WriteInAscii(const ElementNode &element) {
+  const Ref<StringWriter> writer = CreateStringWriter();
+  element.WriteTo(*writer, CharacterForm::REFERENCES);
+  return writer->GetText();
+}
+
+TEST(WriteTo, WritesUtf8WhenNotAskedForReferences) {
+  const std::string text = "<a x=\"\xC3\xBC\">\xF0\x9F\x98\x80</a>";
+  EXPECT_EQ(WriteAgain(text), text);
+}
+
+TEST(WriteTo, WritesTextAndAttributeValuesAsReferencesWhenAskedTo) {
+  const auto document = ParseDocument("<a x='\xC3\xBC&amp;\xC5\x82\t\xF0\x9F\x98\x80'>\x7F\xC2\x80&lt;\xE8\xAA\x9E"
+                                      "\xEF\xBF\xBD\xF4\x8F\xBF\xBFz</a>");
+  EXPECT_EQ(WriteInAscii(*document->GetDocumentElement()),
+            "<a x=\"&#xFC;&amp;&#x142; &#x1F600;\">\x7F&#x80;&lt;&#x8A9E;&#xFFFD;&#x10FFFF;z</a>");
+}
+
+TEST(WriteTo, LeavesNamesCommentsAndInstructionsAsTheyAreWhenAskedForReferences) {
+  const std::string text =
+      "<\xC3\xBC:a xmlns:\xC3\xBC=\"urn:u\" \xC3\xA4=\"1\"><!-- \xC3\xB6 --><?\xC3\xBC \xC3\xA4?></\xC3\xBC:a>";
+  EXPECT_EQ(WriteInAscii(*ParseDocument(text)->GetDocumentElement()), text);
+}
+
+TEST(WriteTo, WritesMoreReferencesThanItsBufferHolds) {
+  std::string text;
+  std::string references;
+  for (int i = 0; i < 20'000; ++i) {
+    text += i % 7 == 0 ? "x" : "\xC3\xBC";
+    references += i % 7 == 0 ? "x" : "&#xFC;";
+  }
+  const auto document = ParseDocument("<a>" + text + "</a>");
+  EXPECT_TRUE(WriteInAscii(*document->GetDocumentElement()) == "<a>" + references + "</a>");
+}
+
 const char *const TEXTS[] = {"",
                              "plain",
                              " leading and trailing ",
@@ -77,10 +112,12 @@ TEST(WriteTo, CarriesEachTextThroughAParserUnchanged) {
     node->SetValue(text);
     element->DefineAttribute("x", text);
     element->AppendChild(node.get());
-    const auto document = ParseDocument(WriteElement(*element));
-    const TextNode *const read = AsText(document->GetDocumentElement()->GetFirstChild());
-    EXPECT_EQ(read ? read->GetValue() : "", text);
-    EXPECT_EQ(document->GetDocumentElement()->GetFirstAttribute()->GetValue(), text);
+    for (const std::string &written : {WriteElement(*element), WriteInAscii(*element)}) {
+      const auto document = ParseDocument(written);
+      const TextNode *const read = AsText(document->GetDocumentElement()->GetFirstChild());
+      EXPECT_EQ(read ? read->GetValue() : "", text);
+      EXPECT_EQ(document->GetDocumentElement()->GetFirstAttribute()->GetValue(), text);
+    }
   }
 }
 
@@ -110,6 +147,8 @@ TEST(WriteTo, GivesTheSameTreeBackForEachToken) {
     const auto document = ParseDocument(::Testing::ReadDataFile("tokens/" + entry.path().filename().string()));
     const auto again = ParseDocument(WriteElement(*document->GetDocumentElement()));
     EXPECT_TRUE(DescribeTree(*again->GetDocumentElement()) == DescribeTree(*document->GetDocumentElement()));
+    const auto inAscii = ParseDocument(WriteInAscii(*document->GetDocumentElement()));
+    EXPECT_TRUE(DescribeTree(*inAscii->GetDocumentElement()) == DescribeTree(*document->GetDocumentElement()));
     ++tokens;
   }
   EXPECT_GT(tokens, 10u);

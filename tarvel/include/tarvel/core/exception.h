@@ -79,6 +79,11 @@ class TARVEL_API InvalidStateException : public Exception {
   TARVEL_EXCEPTION_BODY(InvalidStateException, Exception);
 };
 
+/// Memory that ran out.
+class TARVEL_API OutOfMemoryException : public Exception {
+  TARVEL_EXCEPTION_BODY(OutOfMemoryException, Exception);
+};
+
 /// An object that is not of the class that is asked for.
 class TARVEL_API TypeMismatchException : public Exception {
   TARVEL_EXCEPTION_BODY(TypeMismatchException, Exception);

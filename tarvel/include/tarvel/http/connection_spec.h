@@ -19,8 +19,9 @@ namespace Http {
 /// Opens connections to one endpoint. Immutable; safe on any thread.
 class TARVEL_API ConnectionSpec : public Object {
 public:
-  /// Called once, on an I/O thread, with the stream and null, or with an exception; the stream may be given then too. It
-  /// must not block, nor wait for another operation: start the next one from it.
+  /// Called exactly once for each start that has not thrown, on an I/O thread, with the stream and null, or with an
+  /// exception, which is valid during the call; the stream may be given then too. It must not block, nor wait for another
+  /// operation: start the next one from it.
   using ConnectCompletion = std::function<void(const Ref<System::Stream> &, const Exception *)>;
 
   /// One line for logs. The platform does not read it.
@@ -37,7 +38,8 @@ public:
   virtual bool IsReuseOnAuthErrorSupported() const = 0;
 
   /// Starts to connect. The returned item cancels the attempt; the completion then gets an exception. What goes wrong
-  /// is for the completion, as a rule in a `System::NetworkException`, of which `Ssl::SSLException` is one.
+  /// is for the completion, as a rule in a `System::NetworkException`, of which `Ssl::SSLException` is one; an
+  /// `OutOfMemoryException` when memory ran out, an `InvalidStateException` with the text of a foreign exception.
   /// @throws InvalidStateException when there is no I/O thread that could call the completion, and none can be started;
   ///         `std::bad_alloc`. The completion is not called then.
   virtual Ref<System::ScheduledItem> AsyncConnect(ConnectCompletion completion) const = 0;

@@ -21,7 +21,7 @@
 namespace Tarvel {
 namespace Http {
 
-constexpr std::size_t MAX_HEADER_BYTES = 64u * 1024;      ///< of a response, status line included
+constexpr std::size_t MAX_HEADER_BYTES = 64u * 1024;      ///< of each response, interim ones too; status line included
 constexpr std::size_t MAX_BODY_BYTES = 16u * 1024 * 1024; ///< of a response
 
 /// A response that is not HTTP/1.x as RFC 9112 has it, that contradicts itself, ends early or is over a limit.
@@ -44,7 +44,14 @@ protected:
   ~ClientRequest() override;
 };
 
-/// A whole response. As a reader it gives the body.
+/// A whole response. As a reader it gives the body, which is wiped when the response is destroyed; what `ReadToEnd` hands
+/// out is the caller's to wipe. With a status other than 2xx and 500, the header is all that was read:
+/// the body is empty, and when the header states the body's length or coding in a wrong way, the headers from that one on
+/// are missing.
+///
+/// A body is handed on as it came, with one exception: one that is declared as ISO-8859-1 by the charset of its media type,
+/// under any of the names that IANA lists, is handed on as UTF-8, unless it is UTF-8 and not ASCII already. An XML
+/// declaration in it that names ISO-8859-1 then names UTF-8. Such a body has at most twice the bytes of the one that came.
 class TARVEL_API ClientResponse : public Reader {
 public:
   virtual int GetStatusCode() const noexcept = 0;
@@ -75,16 +82,20 @@ protected:
 class TARVEL_API UserAgent : public Object {
 public:
   /// Called exactly once for each start, on an I/O thread: with null and the whole response, or with an exception and
-  /// null. The exception is valid during the call. The item is the one that `StartRequest` hands out. An exception that
-  /// leaves the function is logged and goes no further. The function must not block, nor wait for another request: the
-  /// thread is one of two, on which that request would have to complete. Start the next one from here, and queue work that
-  /// takes time on a thread pool.
+  /// null, whatever went wrong: memory that ran out is an `OutOfMemoryException`, what another library or an
+  /// implementation of stream, specification or cookie store throws that is not a `Tarvel::Exception` is an
+  /// `InvalidStateException` with its text. The exception is valid during the call. The item is the one that
+  /// `StartRequest` hands out. An exception that leaves the function is logged and goes no further. The function must not
+  /// block, nor wait for another request: the thread is one of two, on which that request would have to complete. Start
+  /// the next one from here, and queue work that takes time on a thread pool.
   using CompletionFunction =
       std::function<void(const Exception *, const Ref<ClientResponse> &, const Ref<PendingRequestItem> &)>;
 
   /// Connects, sends and reads the response, without blocking, and without a time-out of its own: who does not wait may
-  /// cancel the item. Redirects are not followed. Content is not decoded; as no coding is asked for, content that has one
-  /// is a failure. The request's body is wiped once it is sent.
+  /// cancel the item. Redirects are not followed. At most 16 interim responses (1xx but 101) are passed over; one more is
+  /// an HttpException. A status other than 2xx and 500 is reported as soon as its header is there. For those two, content
+  /// is not decoded; as no coding is asked for, content that has one is a failure. Bytes after the response are ignored.
+  /// The request's body is wiped once it is sent.
   /// @throws InvalidArgumentException for a request that `CreateHttpRequest` did not make, InvalidStateException for one
   ///         that has been started, and whatever the connection specification throws; the completion function is not
   ///         called then.

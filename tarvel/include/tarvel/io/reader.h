@@ -24,11 +24,15 @@ public:
   /// @throws IOException when the source fails.
   virtual std::string ReadToEnd(std::size_t maximumBytes);
 
+  /// The charset that the source declares for its bytes, as it is written there ("windows-1252"); empty when it declares
+  /// none. For messages: whoever can, hands on UTF-8.
+  virtual std::string GetDeclaredCharset() const;
+
 protected:
   ~Reader() override;
 };
 
-/// A reader over `text`, which it keeps.
+/// A reader over `text`, which it keeps, and overwrites when it is destroyed.
 TARVEL_API Ref<Reader> CreateStringReader(std::string text);
 
 } // namespace Tarvel

@@ -26,6 +26,13 @@ class ElementNode;
 class NodeArena;
 class TreeBuilder;
 
+/// How characters beyond ASCII are written.
+enum class CharacterForm : std::uint8_t {
+  UTF8,      ///< as they are
+  REFERENCES ///< in text and attribute values by number (`&#xFC;`), so that a receiver reads them right whatever encoding it
+             ///< assumes; names, comments and processing instructions, where XML knows no references, as they are
+};
+
 enum class NodeKind : std::uint8_t { DOCUMENT, ELEMENT, TEXT, COMMENT, PROCESSING_INSTRUCTION };
 
 /// What every node has. Nodes are made by the factories below and by the parser, never copied.
@@ -200,8 +207,9 @@ public:
   void AppendChild(Node *child);
 
   /// Writes the element and all below as UTF-8 XML, without an XML declaration. Text, attribute values and line ends are
-  /// escaped so that a parser gives back the same tree; an element without children is written as "<name></name>".
-  void WriteTo(Writer &writer) const;
+  /// escaped so that a parser gives back the same tree, in either form; an element without children is written as
+  /// "<name></name>".
+  void WriteTo(Writer &writer, CharacterForm form = CharacterForm::UTF8) const;
 
 private:
   explicit ElementNode(NodeArena *arena) noexcept : Node(NodeKind::ELEMENT, arena) {}

@@ -1,0 +1,15 @@
+// SPDX-License-Identifier: Apache-2.0
+/// @file
+/// `AppendWiping`, for a text that is secret and grows.
+
+#pragma once
+
+#include <string>
+#include <string_view>
+
+namespace Tarvel {
+
+/// Appends `bytes`, which are not part of `text`. Memory that the text outgrows is overwritten before it is freed.
+void AppendWiping(std::string &text, std::string_view bytes);
+
+} // namespace Tarvel

@@ -1,0 +1,138 @@
+// SPDX-License-Identifier: Apache-2.0
+
+#include "http/charset.h"
+
+#include "http/header_syntax.h"
+#include "xml/characters.h"
+
+#include <tarvel/core/secure_wipe.h>
+
+#include <algorithm>
+#include <array>
+#include <cstddef>
+
+namespace Tarvel::Http {
+
+namespace {
+
+constexpr std::size_t MAX_CHARSET_LENGTH = 40;
+constexpr std::size_t MAX_DECLARATION_LENGTH = 256; // of an XML declaration that is looked into
+
+constexpr std::array<std::string_view, 9> LATIN1_NAMES{
+    "ISO-8859-1", "ISO_8859-1", "ISO_8859-1:1987", "iso-ir-100", "latin1", "l1", "IBM819", "CP819", "csISOLatin1"};
+
+bool IsLatin1(std::string_view charset) {
+  return std::any_of(LATIN1_NAMES.begin(), LATIN1_NAMES.end(),
+                     [charset](std::string_view name) { return EqualsIgnoringCase(name, charset); });
+}
+
+bool IsBeyondAscii(char c) noexcept {
+  return static_cast<unsigned char>(c) > 0x7F;
+}
+
+/// Takes a parameter's value, a token or a quoted string, from the beginning of `rest`.
+std::string TakeValue(std::string_view &rest) {
+  std::string value;
+  if (rest.empty() || rest.front() != '"') {
+    const std::size_t end = std::min(rest.find(';'), rest.size());
+    value = std::string(TrimBlanks(rest.substr(0, end)));
+    rest.remove_prefix(end);
+    return value;
+  }
+  std::size_t at = 1;
+  for (; at < rest.size() && rest[at] != '"'; ++at) {
+    if (rest[at] == '\\' && at + 1 < rest.size()) {
+      ++at; // the character behind it stands for itself
+    }
+    value.push_back(rest[at]);
+  }
+  rest.remove_prefix(std::min(rest.find(';', at), rest.size()));
+  return value;
+}
+
+/// The value of the encoding in the XML declaration that `text` begins with; empty when there is none.
+std::string_view FindDeclaredEncoding(std::string_view text) {
+  constexpr std::string_view BEGINNING = "<?xml";
+  constexpr std::string_view SPACE = " \t\r\n";
+  std::string_view rest = text.substr(0, MAX_DECLARATION_LENGTH);
+  const std::size_t close = rest.find("?>");
+  if (rest.substr(0, BEGINNING.size()) != BEGINNING || close == std::string_view::npos) {
+    return {};
+  }
+  rest = rest.substr(0, close);
+  rest.remove_prefix(BEGINNING.size());
+  const auto skipSpace = [&rest] { rest.remove_prefix(std::min(rest.find_first_not_of(SPACE), rest.size())); };
+  for (;;) {
+    skipSpace();
+    const std::string_view name = rest.substr(0, rest.find_first_of(" \t\r\n="));
+    rest.remove_prefix(name.size());
+    skipSpace();
+    if (name.empty() || rest.empty() || rest.front() != '=') {
+      return {};
+    }
+    rest.remove_prefix(1);
+    skipSpace();
+    const std::size_t end = rest.empty() ? std::string_view::npos : rest.find(rest.front(), 1);
+    if (end == std::string_view::npos || (rest.front() != '"' && rest.front() != '\'')) {
+      return {};
+    }
+    if (name == "encoding") {
+      return rest.substr(1, end - 1);
+    }
+    rest.remove_prefix(end + 1);
+  }
+}
+
+} // namespace
+
+std::string FindCharset(std::string_view contentType) {
+  std::string_view rest = contentType.substr(std::min(contentType.find(';'), contentType.size()));
+  while (!rest.empty()) {
+    rest.remove_prefix(1); // the semicolon
+    const std::size_t equals = rest.find_first_of("=;");
+    if (equals == std::string_view::npos || rest[equals] == ';') {
+      rest.remove_prefix(std::min(equals, rest.size()));
+      continue;
+    }
+    const std::string_view name = TrimBlanks(rest.substr(0, equals));
+    rest.remove_prefix(equals + 1);
+    std::string value = TakeValue(rest);
+    if (EqualsIgnoringCase(name, "charset")) {
+      return IsToken(value) && value.size() <= MAX_CHARSET_LENGTH ? value : std::string();
+    }
+  }
+  return {};
+}
+
+void RecodeToUtf8(std::string &body, std::string_view charset) {
+  if (!IsLatin1(charset)) {
+    return;
+  }
+  const auto beyondAscii = std::count_if(body.begin(), body.end(), IsBeyondAscii);
+  if (beyondAscii > 0 && Xml::FindInvalidUtf8(body) == std::string_view::npos) {
+    return;
+  }
+  const std::string_view declared = FindDeclaredEncoding(body);
+  const bool isDeclared = IsLatin1(declared);
+  if (beyondAscii == 0 && !isDeclared) {
+    return;
+  }
+  constexpr std::string_view UTF8 = "UTF-8"; // shorter than the names that it replaces, or not much longer
+  std::string recoded;
+  recoded.reserve(body.size() + static_cast<std::size_t>(beyondAscii) + UTF8.size());
+  const std::size_t end = isDeclared ? static_cast<std::size_t>(declared.data() - body.data()) : 0;
+  recoded.append(body, 0, end).append(isDeclared ? UTF8 : "");
+  for (const char c : std::string_view(body).substr(end + (isDeclared ? declared.size() : 0))) {
+    const auto byte = static_cast<unsigned char>(c);
+    if (IsBeyondAscii(c)) {
+      recoded.push_back(static_cast<char>(0xC0 | byte >> 6));
+      recoded.push_back(static_cast<char>(0x80 | (byte & 0x3F)));
+    } else {
+      recoded.push_back(c);
+    }
+  }
+  body.swap(recoded);
+  SecureWipe(recoded);
+}
+
+} // namespace Tarvel::Http

@@ -1,0 +1,224 @@
+// SPDX-License-Identifier: Apache-2.0
+// A completion must be called however early memory runs out. This program replaces the allocation functions of C++, and
+// lets each allocation of an exchange fail in its turn. All of it runs on the test's thread, in one order.
+#include "transport/https_session.h"
+
+#include <tarvel/core/exception.h>
+#include <tarvel/http/connection_spec.h>
+#include <tarvel/ssl/ssl_context.h>
+
+#include <gtest/gtest.h>
+
+#include <cstdlib>
+#include <cstring>
+#include <limits>
+#include <new>
+#include <string>
+#include <string_view>
+#include <utility>
+#include <vector>
+
+namespace {
+
+constexpr long NEVER = std::numeric_limits<long>::max();
+
+thread_local long t_allocationsLeft = NEVER; // before the one that fails
+thread_local bool t_failsOnce = false;       // otherwise all that follow fail, too
+thread_local bool t_hasFailed = false;
+
+void *Allocate(std::size_t bytes) {
+  if (t_allocationsLeft != NEVER && t_allocationsLeft-- <= 0) {
+    t_allocationsLeft = t_failsOnce ? NEVER : 0;
+    t_hasFailed = true;
+    throw std::bad_alloc();
+  }
+  if (void *const memory = std::malloc(bytes ? bytes : 1)) {
+    return memory;
+  }
+  throw std::bad_alloc();
+}
+
+} // namespace
+
+void *operator new(std::size_t bytes) {
+  return Allocate(bytes);
+}
+void *operator new[](std::size_t bytes) {
+  return Allocate(bytes);
+}
+void operator delete(void *memory) noexcept {
+  std::free(memory);
+}
+void operator delete[](void *memory) noexcept {
+  std::free(memory);
+}
+void operator delete(void *memory, std::size_t) noexcept {
+  std::free(memory);
+}
+void operator delete[](void *memory, std::size_t) noexcept {
+  std::free(memory);
+}
+
+namespace SsoClient {
+namespace {
+
+using Tarvel::Exception;
+using Tarvel::Ref;
+using Tarvel::Http::ConnectionSpec;
+using Tarvel::System::ScheduledItem;
+using Tarvel::System::Stream;
+
+const char ANSWER[] = "HTTP/1.1 200 OK\r\nSet-Cookie: name=value-that-is-too-long-for-the-string-itself\r\n"
+                      "Transfer-Encoding: chunked\r\n\r\n20\r\n0123456789012345678901234567890\n\r\n0\r\n\r\n";
+const char REFUSAL[] = "HTTP/1.1 503 Not available, for a reason that is too long for the string itself\r\n\r\n";
+
+/// Completes nothing until the test does, and needs no memory of its own for that.
+class ScriptedStream final : public Stream {
+public:
+  explicit ScriptedStream(const char *answer) : m_rest(answer) {}
+
+  void AsyncReadSome(char *buffer, std::size_t length, TransferHandler handler) override {
+    m_buffer = buffer;
+    m_length = length;
+    m_read = std::move(handler);
+  }
+  void AsyncWrite(const char *, std::size_t length, TransferHandler handler) override {
+    m_written = length;
+    m_write = std::move(handler);
+  }
+  void Close() noexcept override { m_isClosed = true; }
+
+  /// Completes what is pending; false when nothing was.
+  bool Advance(const Exception &closed) {
+    if (m_write) {
+      std::exchange(m_write, nullptr)(m_isClosed ? 0 : m_written, m_isClosed ? &closed : nullptr);
+      return true;
+    }
+    if (m_read) {
+      const std::size_t count = m_isClosed ? 0 : m_rest.substr(0, 30).copy(m_buffer, m_length);
+      m_rest.remove_prefix(count);
+      std::exchange(m_read, nullptr)(count, m_isClosed ? &closed : nullptr);
+      return true;
+    }
+    return false;
+  }
+
+private:
+  std::string_view m_rest;
+  TransferHandler m_read;
+  TransferHandler m_write;
+  char *m_buffer = nullptr;
+  std::size_t m_length = 0;
+  std::size_t m_written = 0;
+  bool m_isClosed = false;
+};
+
+class ScriptedSpec final : public Tarvel::Http::CustomConnectionSpec {
+public:
+  explicit ScriptedSpec(const Ref<Stream> &stream) : m_stream(stream) {}
+  std::string ToString() const override { return "scripted"; }
+  std::string GetHost() const override { return "a-name-that-is-too-long-for-the-string-itself.example"; }
+  std::string GetEndpointString() const override { return GetHost() + ":8080"; }
+  bool IsReuseOnAuthErrorSupported() const override { return false; }
+  Ref<ScheduledItem> AsyncConnect(ConnectCompletion completion) const override {
+    m_completion = std::move(completion);
+    return nullptr;
+  }
+  void Connect(const Exception *failure) const {
+    if (m_completion) {
+      std::exchange(m_completion, nullptr)(failure ? nullptr : m_stream, failure);
+    }
+  }
+
+private:
+  const Ref<Stream> m_stream;
+  mutable ConnectCompletion m_completion;
+};
+
+struct Outcome {
+  int calls = 0;
+  bool succeeded = false;
+  bool ranOutOfMemory = false; // by the class, or by the text, for which there may be memory again
+};
+
+/// Asks with so many allocations that go well; -1 calls when the start itself failed.
+Outcome AskWith(long allocations, const char *answer, const Exception *connectFailure) {
+  const Tarvel::System::NetworkException closed("closed");
+  const auto stream = Tarvel::MakeRef<ScriptedStream>(answer);
+  const auto spec = Tarvel::MakeRef<ScriptedSpec>(stream);
+  HttpsSession session(spec, "/", 1);
+  Request request;
+  request.body = "<a-request-that-is-too-long-for-the-string-itself/>";
+  Outcome outcome;
+  const TransportSession::Completion completion = [&outcome](const Exception *failure, Tarvel::Reader *response) {
+    ++outcome.calls;
+    EXPECT_NE(failure == nullptr, response == nullptr);
+    outcome.succeeded = response != nullptr;
+    outcome.ranOutOfMemory = dynamic_cast<const Tarvel::OutOfMemoryException *>(failure) != nullptr ||
+                             (failure && std::strcmp(failure->what(), "Out of memory") == 0);
+  };
+  Ref<ScheduledItem> item;
+  t_hasFailed = false;
+  t_allocationsLeft = allocations;
+  try {
+    session.SendRequestAsync(request, completion, item);
+    spec->Connect(connectFailure);
+    while (stream->Advance(closed)) {
+    }
+  } catch (const std::bad_alloc &) {
+    t_allocationsLeft = NEVER;
+    EXPECT_EQ(outcome.calls, 0);
+    EXPECT_FALSE(item) << "what was started let an exception out";
+    spec->Connect(connectFailure);
+    outcome.calls = outcome.calls == 0 ? -1 : outcome.calls;
+  }
+  t_allocationsLeft = NEVER;
+  return outcome;
+}
+
+/// Lets memory run out ever later, until it lasts.
+void ExpectOneCallWhereverMemoryRunsOut(bool once, const char *answer, const Exception *connectFailure, bool succeeds) {
+  AskWith(NEVER, answer, connectFailure); // what is made once is made
+  t_failsOnce = once;
+  bool started = false;
+  for (long allocations = 0;; ++allocations) {
+    SCOPED_TRACE(allocations);
+    ASSERT_LT(allocations, 10000);
+    const Outcome outcome = AskWith(allocations, answer, connectFailure);
+    ASSERT_TRUE(outcome.calls == 1 || (!started && outcome.calls == -1)) << outcome.calls;
+    started = outcome.calls == 1;
+    if (!t_hasFailed) {
+      EXPECT_EQ(outcome.succeeded, succeeds);
+      EXPECT_FALSE(outcome.ranOutOfMemory);
+      EXPECT_GT(allocations, 10);
+      return;
+    }
+    EXPECT_EQ(outcome.ranOutOfMemory, started);
+  }
+}
+
+/// Whether one allocation alone fails.
+class SendRequestAsync : public testing::TestWithParam<bool> {};
+
+TEST_P(SendRequestAsync, CallsItsCompletionOnceWhereverMemoryRunsOut) {
+  ExpectOneCallWhereverMemoryRunsOut(GetParam(), ANSWER, nullptr, true);
+}
+
+TEST_P(SendRequestAsync, CallsItsCompletionOnceWhereverMemoryRunsOutOverARefusedStatus) {
+  ExpectOneCallWhereverMemoryRunsOut(GetParam(), REFUSAL, nullptr, false);
+}
+
+TEST_P(SendRequestAsync, CallsItsCompletionOnceWhereverMemoryRunsOutOverABadResponse) {
+  ExpectOneCallWhereverMemoryRunsOut(GetParam(), "220 mail.example ESMTP\r\n", nullptr, false);
+}
+
+TEST_P(SendRequestAsync, CallsItsCompletionOnceWhereverMemoryRunsOutOverAFailedConnect) {
+  const Tarvel::System::NetworkException failure("a text that is too long for the string itself, by some characters");
+  ExpectOneCallWhereverMemoryRunsOut(GetParam(), ANSWER, &failure, false);
+}
+
+INSTANTIATE_TEST_SUITE_P(Failures, SendRequestAsync, testing::Bool(),
+                         [](const auto &once) { return once.param ? "One" : "AllThatFollow"; });
+
+} // namespace
+} // namespace SsoClient
