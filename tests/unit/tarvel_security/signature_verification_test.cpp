@@ -385,6 +385,21 @@ TEST(Verify, TakesOutThisSignatureAndNoOther) {
   EXPECT_EQ("wrong", Refusal("</saml:Assertion>", signature + "</saml:Assertion>"));
 }
 
+/// A resolver whose keys cannot be read.
+class BrokenResolver final : public Tarvel::Xml::Security::KeyInfoResolver {
+public:
+  CertificateList Resolve(const Tarvel::Xml::ElementNode *) const override {
+    throw Tarvel::Crypto::CryptoException("the key cannot be read");
+  }
+};
+
+TEST(Verify, RaisesAFailureOfCryptographyAsItsOwnClass) {
+  std::set<std::string> uris;
+  EXPECT_THROWS_MESSAGE(SignatureOf(*ParseDocument(GoodToken()))->Verify(BrokenResolver(), uris), XmlSecurityException,
+                        "the key cannot be read");
+  EXPECT_TRUE(uris.empty());
+}
+
 TEST(Verify, KeepsTheTreeAliveAfterTheDocumentIsGone) {
   Tarvel::Ref<Tarvel::Xml::Security::Signature> signature;
   {
