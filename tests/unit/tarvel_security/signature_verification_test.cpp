@@ -338,6 +338,38 @@ TEST(Verify, RefusesAnEnvelopedTransformOfTheSignatureItself) {
       RefusalOf(text));
 }
 
+TEST(Verify, RefusesASignatureThatRemovesAllThatItCovers) {
+  std::string text = ReadDataFile("tokens/reference-empty-uri.xml");
+  const std::size_t begin = text.find("<ds:Signature ");
+  text = text.substr(begin, text.find("</ds:Signature>") + 15 - begin);
+  const std::string refusal = "The reference URI \"\" covers nothing but the signature, which the enveloped-signature "
+                              "transform removes";
+  EXPECT_EQ(refusal, RefusalOf(text));
+  EXPECT_EQ(refusal, RefusalOf("<?target data?>" + text + "<!-- after -->"));
+  EXPECT_EQ("wrong", RefusalOf("<r>" + text + "</r>"));
+}
+
+/// The genuine token whose canonicalisation names that many prefixes, judged.
+std::string JudgePrefixes(std::size_t count, const std::string &separator) {
+  std::string list;
+  for (std::size_t number = 0; number < count; ++number) {
+    list += separator + "p" + std::to_string(number);
+  }
+  return Refusal(
+      EXCLUSIVE_TRANSFORM,
+      "<ds:Transform Algorithm=\"http://www.w3.org/2001/10/xml-exc-c14n#\"><InclusiveNamespaces PrefixList=\"" + list +
+          "\" xmlns=\"http://www.w3.org/2001/10/xml-exc-c14n#\"/></ds:Transform>");
+}
+
+TEST(Verify, AcceptsAtMost256InclusivePrefixes) {
+  const std::string refusal =
+      "The PrefixList of the algorithm \"http://www.w3.org/2001/10/xml-exc-c14n#\" has more than 256 prefixes";
+  EXPECT_EQ("wrong", JudgePrefixes(256, " ")); // accepted as an algorithm, and not what was signed
+  EXPECT_EQ("wrong", JudgePrefixes(256, "&#9; &#13;&#10;"));
+  EXPECT_EQ(refusal, JudgePrefixes(257, " "));
+  EXPECT_EQ(refusal, JudgePrefixes(1000, "&#10;"));
+}
+
 TEST(Verify, RefusesATreeWithoutCanonicalForm) {
   EXPECT_EQ(0u, Refusal("<saml:Subject>", "<saml:Subject><foo:bar/>").find("No canonical form: "));
 }

@@ -81,15 +81,6 @@ void NoteMatches(const ElementNode &element, const std::vector<std::string_view>
   }
 }
 
-void RequireFound(const IdentifierSearch &search, std::string_view uri, const ElementNode &root) {
-  if (!search.target) {
-    Refuse(uri, "no element has that identifier");
-  }
-  if (HasIdentifier(root, search.identifier) && search.target != &root) {
-    Refuse(uri, "it means another element than the one that the signature is to cover");
-  }
-}
-
 } // namespace
 
 std::vector<IdentifierSearch> PlanSearches(const std::vector<std::string_view> &uris) {
@@ -114,7 +105,9 @@ std::vector<const Node *> ResolveReferences(const ElementNode &root, const std::
   }
   std::vector<const Node *> targets(uris.size(), top);
   for (const IdentifierSearch &search : searches) {
-    RequireFound(search, uris[search.reference], root);
+    if (!search.target) {
+      Refuse(uris[search.reference], "no element has that identifier");
+    }
     targets[search.reference] = search.target;
   }
   for (std::size_t index = 0; index < uris.size(); ++index) {

@@ -6,6 +6,7 @@
 #include <tarvel/xml/security/exceptions.h>
 #include <tarvel/xml/security/signature.h>
 
+#include <algorithm>
 #include <string>
 #include <utility>
 
@@ -18,6 +19,9 @@ using Crypto::SignatureScheme;
 
 constexpr std::size_t MAX_REFERENCES = 10;
 constexpr std::size_t MAX_TRANSFORMS = 2; // of one reference
+constexpr std::size_t MAX_INCLUSIVE_PREFIXES = 256;
+
+constexpr std::string_view WHITE_SPACE = " \t\r\n";
 
 struct NamedSignatureAlgorithm {
   std::string_view uri;
@@ -60,9 +64,24 @@ void RequireNoParameters(const AlgorithmSyntax &syntax) {
   if (!syntax.otherParameter.empty()) {
     RefuseParameter(syntax.otherParameter, syntax.uri);
   }
-  if (syntax.inclusivePrefixes) {
+  if (syntax.prefixList) {
     RefuseParameter("InclusiveNamespaces", syntax.uri);
   }
+}
+
+/// The prefixes of a list that blanks keep apart. Counted while it is read: a list of millions needs no memory.
+std::vector<std::string> RequirePrefixes(std::string_view list, std::string_view uri) {
+  std::vector<std::string> prefixes;
+  for (std::size_t begin = list.find_first_not_of(WHITE_SPACE); begin != std::string_view::npos;) {
+    if (prefixes.size() == MAX_INCLUSIVE_PREFIXES) {
+      throw XmlSecurityException("The PrefixList of the algorithm \"" + std::string(uri) + "\" has more than " +
+                                 std::to_string(MAX_INCLUSIVE_PREFIXES) + " prefixes");
+    }
+    const std::size_t end = std::min(list.find_first_of(WHITE_SPACE, begin), list.size());
+    prefixes.emplace_back(list.substr(begin, end - begin));
+    begin = list.find_first_not_of(WHITE_SPACE, end);
+  }
+  return prefixes;
 }
 
 CanonicalMethod RequireCanonicalMethod(const char *kind, const AlgorithmSyntax &syntax) {
@@ -73,8 +92,8 @@ CanonicalMethod RequireCanonicalMethod(const char *kind, const AlgorithmSyntax &
   if (!method.isExclusive || !syntax.otherParameter.empty()) {
     RequireNoParameters(syntax);
   }
-  if (syntax.inclusivePrefixes) {
-    SetInclusivePrefixes(method, *syntax.inclusivePrefixes);
+  if (syntax.prefixList) {
+    SetInclusivePrefixes(method, RequirePrefixes(*syntax.prefixList, syntax.uri));
   }
   return method;
 }

@@ -143,6 +143,11 @@ void ParsedSignature::RequireEnveloping(const Node &target, const ReferencePlan 
     throw XmlSecurityException("The reference URI \"" + std::string(reference.uri) +
                                "\" has the enveloped-signature transform, but does not envelop the signature");
   }
+  // Without its document element a document has nothing that could be signed, and the digest of nothing fits every such.
+  if (plan.omitsSignature && target.GetKind() == NodeKind::DOCUMENT && signature->GetParent() == &target) {
+    throw XmlSecurityException("The reference URI \"" + std::string(reference.uri) +
+                               "\" covers nothing but the signature, which the enveloped-signature transform removes");
+  }
 }
 
 bool ParsedSignature::DigestFits(const Node &target, const ReferencePlan &plan,
