@@ -7,6 +7,7 @@
 #include "system/uncaught_exception.h"
 
 #include <tarvel/core/exception.h>
+#include <tarvel/core/string_util.h>
 
 #include <boost/asio/buffer.hpp>
 #include <boost/asio/error.hpp>
@@ -88,7 +89,7 @@ void TcpClientSocketImpl::AsyncConnect(const std::string &host, int port, Connec
     return;
   }
   m_stage = Stage::CONNECTING;
-  m_target = host + ":" + std::to_string(port);
+  m_target = StringUtil::Shorten(host) + ":" + std::to_string(port);
   m_port = port;
   m_connectHandler = std::move(handler);
   if (const std::string refusal = RefuseTarget(host, port); !refusal.empty()) {

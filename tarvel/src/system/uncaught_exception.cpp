@@ -4,6 +4,7 @@
 
 #include "core/demangle.h"
 
+#include <tarvel/core/string_util.h>
 #include <tarvel/service/app.h>
 #include <tarvel/service/logger.h>
 
@@ -21,7 +22,7 @@ std::string DescribeCurrentException() {
   try {
     throw;
   } catch (const std::exception &exception) {
-    return Demangle(typeid(exception).name()) + ": " + exception.what();
+    return Demangle(typeid(exception).name()) + ": " + StringUtil::Shorten(exception.what());
   } catch (...) {
     return "an object that is no exception";
   }

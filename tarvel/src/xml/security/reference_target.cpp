@@ -2,6 +2,7 @@
 
 #include "xml/security/reference_target.h"
 
+#include <tarvel/core/string_util.h>
 #include <tarvel/xml/security/exceptions.h>
 
 #include <algorithm>
@@ -15,7 +16,7 @@ constexpr std::string_view WSU_NAMESPACE =
     "http://docs.oasis-open.org/wss/2004/01/oasis-200401-wss-wssecurity-utility-1.0.xsd";
 
 [[noreturn]] void Refuse(std::string_view uri, const char *why) {
-  throw XmlSecurityException("The reference URI \"" + std::string(uri) + "\" is not accepted: " + why);
+  throw XmlSecurityException("The reference URI \"" + StringUtil::Shorten(uri) + "\" is not accepted: " + why);
 }
 
 /// The identifier behind the "#", which must be a bare name.

@@ -23,7 +23,7 @@ constexpr std::string_view WHITE_SPACE = " \t\r\n";
 }
 
 std::string Quote(std::string_view name) {
-  return "\"" + std::string(name) + "\"";
+  return "\"" + StringUtil::Shorten(name) + "\"";
 }
 
 bool IsSignatureElement(const ElementNode &element, std::string_view localName) {
