@@ -4,8 +4,10 @@
 
 #pragma once
 
+#include <algorithm>
 #include <cstddef>
 #include <cstring>
+#include <functional>
 #include <vector>
 
 namespace Testing {
@@ -20,11 +22,13 @@ std::size_t SlotOf(Function function) {
   return static_cast<std::size_t>(words[0]) / sizeof(void *);
 }
 
-/// Where each of the `fields` begins in `record`.
+/// Whether the first of `fields` is at the start of `record`, and each of the others after the one before it.
 template <typename Record, typename... Fields>
-std::vector<std::ptrdiff_t> OffsetsIn(const Record &record, const Fields &...fields) {
+bool AreInOrder(const Record &record, const Fields &...fields) {
   const char *const begin = reinterpret_cast<const char *>(&record);
-  return {(reinterpret_cast<const char *>(&fields) - begin)...};
+  const std::vector<std::ptrdiff_t> offsets{(reinterpret_cast<const char *>(&fields) - begin)...};
+  return offsets.front() == 0 &&
+         std::adjacent_find(offsets.begin(), offsets.end(), std::greater_equal<>()) == offsets.end();
 }
 
 } // namespace Testing

@@ -10,21 +10,14 @@
 
 #include <gtest/gtest.h>
 
-#include <algorithm>
 #include <type_traits>
 #include <vector>
 
 namespace {
 
 using namespace SsoClient;
-using Testing::OffsetsIn;
+using Testing::AreInOrder;
 using Testing::SlotOf;
-
-/// Each field begins after the one before it, and the first at the start.
-void ExpectDeclaredOrder(const std::vector<std::ptrdiff_t> &offsets) {
-  EXPECT_EQ(0, offsets.front());
-  EXPECT_TRUE(std::is_sorted(offsets.begin(), offsets.end(), std::less_equal<>())) << ::testing::PrintToString(offsets);
-}
 
 /// `Class` with one more virtual function, whose slot is the number of those that it had.
 template <typename Class>
@@ -109,36 +102,36 @@ static_assert(std::is_aggregate_v<SecurityTokenServiceConfig>);
 
 TEST(DeclaredOrder, FieldsOfTokenSpec) {
   const TokenSpec spec;
-  ExpectDeclaredOrder(OffsetsIn(spec, spec.tokenLifetimeSec, spec.audienceRestriction, spec.advice, spec.delegable,
-                                spec.delegateTo, spec.renewable, spec.confirmation));
+  EXPECT_TRUE(AreInOrder(spec, spec.tokenLifetimeSec, spec.audienceRestriction, spec.advice, spec.delegable,
+                         spec.delegateTo, spec.renewable, spec.confirmation));
 }
 
 TEST(DeclaredOrder, FieldsOfSecurityTokenServiceConfig) {
   const SecurityTokenServiceConfig config;
-  ExpectDeclaredOrder(OffsetsIn(config, config.stsUrl, config.signingCertificates, config.sslParameter,
-                                config.holderOfKeyConfig, config.sslContext, config.useDomainControllerName));
+  EXPECT_TRUE(AreInOrder(config, config.stsUrl, config.signingCertificates, config.sslParameter,
+                         config.holderOfKeyConfig, config.sslContext, config.useDomainControllerName));
 }
 
 TEST(DeclaredOrder, FieldsOfHolderOfKeyConfig) {
   const HolderOfKeyConfig config;
-  ExpectDeclaredOrder(OffsetsIn(config, config.privateKey, config.certificate));
+  EXPECT_TRUE(AreInOrder(config, config.privateKey, config.certificate));
 }
 
 TEST(DeclaredOrder, FieldsOfPrincipalId) {
   const PrincipalId principal;
-  ExpectDeclaredOrder(OffsetsIn(principal, principal.name, principal.domain));
+  EXPECT_TRUE(AreInOrder(principal, principal.name, principal.domain));
 }
 
 TEST(DeclaredOrder, FieldsOfDelegate) {
   const Delegate delegate;
-  ExpectDeclaredOrder(OffsetsIn(delegate, delegate.subject, delegate.delegationInstant));
+  EXPECT_TRUE(AreInOrder(delegate, delegate.subject, delegate.delegationInstant));
 }
 
 TEST(DeclaredOrder, FieldsOfAdvice) {
   const Advice advice;
-  ExpectDeclaredOrder(OffsetsIn(advice, advice.source, advice.attributes));
+  EXPECT_TRUE(AreInOrder(advice, advice.source, advice.attributes));
   const AdviceAttribute attribute;
-  ExpectDeclaredOrder(OffsetsIn(attribute, attribute.name, attribute.values));
+  EXPECT_TRUE(AreInOrder(attribute, attribute.name, attribute.values));
 }
 
 } // namespace
