@@ -1,7 +1,9 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// Canonicalisation: what we write for a document or a part of it, libxml2 writes too. The first byte of the input chooses
-/// algorithm, prefix list and part; the rest is the document.
+/// Canonicalisation: what we write for a document or a part of it, libxml2 writes too, and so it follows from expat's events.
+/// The first byte of the input chooses algorithm, prefix list and part; the rest is the document.
+
+#include "integration/signature_oracle/expat_oracle.h"
 
 #include <tarvel/io/reader.h>
 #include <tarvel/io/writer.h>
@@ -104,6 +106,12 @@ std::optional<std::string> OurForm(const Document &document, const Choice &choic
   return writer->TakeText();
 }
 
+std::optional<std::string> FormByExpat(const Document &document, std::string_view text, const Choice &choice) {
+  const bool isPart = &PartOf(document, choice.part) != document.GetDocumentNode();
+  return Testing::CanonicalFormByExpat(text, isPart ? choice.part - 1 : Testing::NO_ELEMENT, Testing::NO_ELEMENT,
+                                       {choice.isExclusive, choice.withComments, PrefixListOf(choice)});
+}
+
 const xmlNode *Next(const xmlNode *node) {
   if (node->children) {
     return node->children;
@@ -177,7 +185,12 @@ extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t *data, std::size_t size
     return 0;
   }
   const std::optional<std::string> ours = OurForm(*document, choice);
-  if (!ours || HasNamespaceNameToEscape(*document)) {
+  if (!ours) {
+    return 0;
+  }
+  const std::optional<std::string> byExpat = FormByExpat(*document, text, choice);
+  Require(!byExpat || *byExpat == *ours);
+  if (HasNamespaceNameToEscape(*document)) {
     return 0;
   }
   const std::optional<std::string> theirs = TheirForm(text, choice);

@@ -1,12 +1,17 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
 /// Signatures: reading and verifying the first `Signature` element of any document ends in an answer or in a documented
-/// exception, and in the same one each time.
+/// exception, and in the same one each time; and what a genuine signature covers is what one of the trusted keys signed.
+
+#include "support/data_file.h"
+#include "xml/security/canonical_form.h"
 
 #include <tarvel/crypto/certificate.h>
 #include <tarvel/io/reader.h>
+#include <tarvel/io/writer.h>
 #include <tarvel/xml/document.h>
 #include <tarvel/xml/parser.h>
+#include <tarvel/xml/security/canonicalizer.h>
 #include <tarvel/xml/security/exceptions.h>
 #include <tarvel/xml/security/key_info_resolver.h>
 #include <tarvel/xml/security/signature.h>
@@ -15,6 +20,7 @@
 #include <cstdlib>
 #include <set>
 #include <string>
+#include <string_view>
 
 namespace {
 
@@ -23,93 +29,145 @@ using Tarvel::Xml::Document;
 using Tarvel::Xml::ElementNode;
 using Tarvel::Xml::Node;
 
-// Of the key that the seeds are signed with; made by openssl.
-constexpr const char *SIGNER = R"(
------BEGIN CERTIFICATE-----
-MIICyTCCAbECFAv6tQ9/HIsB/Tx3grBHGnf2XMPYMA0GCSqGSIb3DQEBCwUAMCAx
-EDAOBgNVBAoMB0V4YW1wbGUxDDAKBgNVBAMMA3N0czAgFw0yMDAxMDEwMDAwMDBa
-GA8yMTIwMDEwMTAwMDAwMFowIDEQMA4GA1UECgwHRXhhbXBsZTEMMAoGA1UEAwwD
-c3RzMIIBIjANBgkqhkiG9w0BAQEFAAOCAQ8AMIIBCgKCAQEA8n+JEaYVjFIgZB7B
-Z1ImemklkeMBWn2ZxPauFWDBKKAghAOZOHGA3hHWb8LG1tfocoxR4dVyJ6HnYCsQ
-SDcd0VqIbXjY6B2fa9f+TRg5DAev/9+2fhHVfIKKBKQEIFSxk4/O1L7MCJsNdyRU
-tZpEs3WnpqDgE4crw0tHgAOzDt1jWQUra17Jw3zJ49vvDvI0m76pw7d/nPpFODiX
-8FeqBW4YNRgC6XbCMsew+NQ2tGyVqU3brFGsrdqI/uLlhte8LOO1SrDrKSjRb3ie
-33H/bWMWHlgyHrLhpS2iViUms1brhsAOi7h8TQTerOybUODZzbwOndVHsS9IgeC5
-MfryLwIDAQABMA0GCSqGSIb3DQEBCwUAA4IBAQDa71KAJpnSVOoVcj9VwlIUmtSk
-L7DnKspnLzqwm9O3MQTrr7ry4MxXme3TCl4yKilt2uDWJU6IZb+aISnviG2lShND
-MwbaebXo/P87B0wQi98PmTy7+bVMnHlYP1RnR7PN+Gkbh9VmkYVbJMo94vYe3j7i
-9Sct2Obu+oufoX7dBwtKa4iYDMDBaEi5LXZ+RkCpOR9K3XQMnqq9egBhcmmlbz4q
-+iI+KQUcj0s8w+25QuTsDsigbWNTc7NUr9W7CxFRX62eqn/vUtI6EcLN6LFfXk8P
-KnOCIjIZfYEE6BJcIaKsKSan1HibjkBzQhnNIr8+Etd7gMB/WrG3EQoe7xn5
------END CERTIFICATE-----
-)";
-
-// A second one, so that there is a choice to narrow.
-constexpr const char *OTHER = R"(
------BEGIN CERTIFICATE-----
-MIIBSDCB7wIUTiikHExPU+/DgLqmzY5XmkBjGj8wCgYIKoZIzj0EAwIwJjEQMA4G
-A1UECgwHRXhhbXBsZTESMBAGA1UEAwwJc3RzIFAtMjU2MCAXDTIwMDEwMTAwMDAw
-MFoYDzIxMjAwMTAxMDAwMDAwWjAmMRAwDgYDVQQKDAdFeGFtcGxlMRIwEAYDVQQD
-DAlzdHMgUC0yNTYwWTATBgcqhkjOPQIBBggqhkjOPQMBBwNCAASQqYOrRu86EH8I
-sUDSi9QesTvMPE1g5td3V3Fjo4Tsn54B+2JjxNT0RLX4pqjdtqTPn5JCVZvVLDx7
-Rtco1b73MAoGCCqGSM49BAMCA0gAMEUCIBoHqYEpKsZQ6xZoru139VSu0JCuJg+V
-a/VrZY74R2I8AiEArLKNh0tn5LB6dH1I/V5BglLud+UyHfFiP3Vb7VOsPpY=
------END CERTIFICATE-----
-)";
-
 void Require(bool condition) {
   if (!condition) {
     std::abort();
   }
 }
 
+const Node *Next(const Node *node) {
+  if (node->GetFirstChild()) {
+    return node->GetFirstChild();
+  }
+  while (node && !node->GetNextSibling()) {
+    node = node->GetParent();
+  }
+  return node ? node->GetNextSibling() : nullptr;
+}
+
 const ElementNode *FindSignature(const Document &document) {
-  for (const Node *node = document.GetDocumentNode(); node;) {
+  for (const Node *node = document.GetDocumentNode(); node; node = Next(node)) {
     const ElementNode *element = Tarvel::Xml::AsElement(node);
     if (element && element->GetLocalName() == "Signature") {
       return element;
     }
-    if (node->GetFirstChild()) {
-      node = node->GetFirstChild();
-      continue;
-    }
-    while (node && !node->GetNextSibling()) {
-      node = node->GetParent();
-    }
-    node = node ? node->GetNextSibling() : nullptr;
   }
   return nullptr;
 }
 
-std::string Judge(const Tarvel::Xml::Security::Signature &signature) {
-  static const auto resolver = Tarvel::Xml::Security::CreateTrustSetKeyResolver(
-      {Tarvel::Crypto::CreateCertificateFromPem(SIGNER), Tarvel::Crypto::CreateCertificateFromPem(OTHER)});
-  std::set<std::string> uris;
-  try {
-    const bool isGenuine = signature.Verify(*resolver, uris);
-    Require(uris.empty() != isGenuine);
-    return isGenuine ? "genuine" : "wrong";
-  } catch (const Tarvel::Xml::Security::XmlSecurityException &exception) {
-    Require(uris.empty());
-    return exception.what();
+Ref<Document> Parse(const std::string &text) {
+  const Ref<Tarvel::Object> result =
+      Tarvel::Xml::CreateXMLParser(Tarvel::Xml::CreateXMLDocumentHandler())->Parse(*Tarvel::CreateStringReader(text));
+  return Ref<Document>(&dynamic_cast<Document &>(*result));
+}
+
+constexpr std::string_view WSU = "http://docs.oasis-open.org/wss/2004/01/oasis-200401-wss-wssecurity-utility-1.0.xsd";
+
+bool HasIdentifier(const ElementNode &element, std::string_view identifier) {
+  for (const auto *attribute = element.GetFirstAttribute(); attribute; attribute = attribute->GetNext()) {
+    const std::string_view name = attribute->GetName();
+    std::string_view uri;
+    if (attribute->GetValue() == identifier &&
+        (name == "ID" || name == "Id" || name == "xml:id" ||
+         (attribute->GetLocalName() == "Id" && element.LookupNamespace(attribute->GetPrefix(), uri) && uri == WSU))) {
+      return true;
+    }
   }
+  return false;
+}
+
+/// What a reference with that URI means: the whole document, or the one element that has that identifier.
+const Node *FindTarget(const Document &document, std::string_view uri) {
+  if (uri.empty()) {
+    return document.GetDocumentNode();
+  }
+  const Node *target = nullptr;
+  for (const Node *node = document.GetDocumentNode(); node; node = Next(node)) {
+    const ElementNode *element = Tarvel::Xml::AsElement(node);
+    if (element && HasIdentifier(*element, uri.substr(1))) {
+      Require(!target);
+      target = node;
+    }
+  }
+  return target;
+}
+
+/// The canonical forms of what a signature says that it covers, without the signature. Which algorithm the signature names does
+/// not matter here: what differs in this form differs in each.
+std::set<std::string> CoveredForms(const Document &document, const ElementNode &signature,
+                                   const std::set<std::string> &uris) {
+  Tarvel::Xml::Security::CanonicalMethod method;
+  Require(Tarvel::Xml::Security::FindCanonicalMethod(Tarvel::Xml::Security::CanonicalizationUri::EXCLUSIVE, method));
+  std::set<std::string> forms;
+  for (const std::string &uri : uris) {
+    const Node *const target = FindTarget(document, uri);
+    Require(target);
+    const Ref<Tarvel::StringWriter> writer = Tarvel::CreateStringWriter();
+    Tarvel::Xml::Security::WriteCanonicalForm(*target, method, &signature, *writer);
+    forms.insert(writer->TakeText());
+  }
+  return forms;
+}
+
+struct Verdict {
+  std::string text; ///< "genuine", "wrong", or the message of the refusal
+  std::set<std::string> uris;
+};
+
+Verdict Judge(const Tarvel::Xml::Security::Signature &signature) {
+  static const auto resolver = Tarvel::Xml::Security::CreateTrustSetKeyResolver(
+      {Tarvel::Crypto::LoadCertificates(Testing::DataPath("tokens/sts-rsa.crt")).front(),
+       Tarvel::Crypto::LoadCertificates(Testing::DataPath("tokens/sts-ec256.crt")).front()});
+  Verdict verdict;
+  try {
+    const bool isGenuine = signature.Verify(*resolver, verdict.uris);
+    Require(verdict.uris.empty() != isGenuine);
+    verdict.text = isGenuine ? "genuine" : "wrong";
+  } catch (const Tarvel::Xml::Security::XmlSecurityException &exception) {
+    Require(verdict.uris.empty());
+    verdict.text = exception.what();
+  }
+  return verdict;
+}
+
+Ref<Tarvel::Xml::Security::Signature> ReadSignature(const Document &document, const ElementNode &element) {
+  Ref<Tarvel::Xml::Security::Signature> signature;
+  Tarvel::Xml::Security::CreateSignatureFromDom(*document.GetDocumentElement(), element, signature);
+  return signature;
+}
+
+/// What is covered in the documents among the seeds that the two keys signed.
+std::set<std::string> ReadGenuineForms() {
+  std::set<std::string> all;
+  for (const char *const name : {"c14n-inclusive-prefixes", "c14n-mixed", "ecdsa-p256-sha256", "reference-empty-uri",
+                                 "reference-two", "rsa-pss-sha512", "rsa-sha256"}) {
+    const Ref<Document> document = Parse(Testing::ReadDataFile("tokens/" + std::string(name) + ".xml"));
+    const ElementNode &element = *FindSignature(*document);
+    const Verdict verdict = Judge(*ReadSignature(*document, element));
+    Require(verdict.text == "genuine");
+    all.merge(CoveredForms(*document, element, verdict.uris));
+  }
+  return all;
 }
 
 } // namespace
 
 extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t *data, std::size_t size) {
+  static const std::set<std::string> genuineForms = ReadGenuineForms();
   try {
-    const Ref<Tarvel::Object> result =
-        Tarvel::Xml::CreateXMLParser(Tarvel::Xml::CreateXMLDocumentHandler())
-            ->Parse(*Tarvel::CreateStringReader(std::string(reinterpret_cast<const char *>(data), size)));
-    const Ref<Document> document(&dynamic_cast<Document &>(*result));
+    const Ref<Document> document = Parse(std::string(reinterpret_cast<const char *>(data), size));
     const ElementNode *element = FindSignature(*document);
     if (!element) {
       return 0;
     }
-    Ref<Tarvel::Xml::Security::Signature> signature;
-    Tarvel::Xml::Security::CreateSignatureFromDom(*document->GetDocumentElement(), *element, signature);
-    Require(Judge(*signature) == Judge(*signature));
+    const Ref<Tarvel::Xml::Security::Signature> signature = ReadSignature(*document, *element);
+    const Verdict verdict = Judge(*signature);
+    Require(verdict.text == Judge(*signature).text);
+    if (verdict.text == "genuine") {
+      for (const std::string &form : CoveredForms(*document, *element, verdict.uris)) {
+        Require(genuineForms.count(form) == 1);
+      }
+    }
   } catch (const Tarvel::Xml::XMLParseException &) {
   } catch (const Tarvel::Xml::Security::SignatureSyntaxException &) {
   }

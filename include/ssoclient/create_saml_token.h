@@ -41,8 +41,10 @@ SSOCLIENT_API std::shared_ptr<const SamlToken> CreateSamlToken(const std::string
                                                                const Tarvel::Crypto::Certificate *certificate);
 
 /// As `CreateSamlToken`, from an `Assertion` element that is parsed already and that may be part of a larger document.
-/// The token's `ToXml` is the canonical form (inclusive Canonical XML 1.0) of the element. The element's tree must not
-/// be changed during the call; the token does not keep it.
+/// The token's `ToXml` is the canonical form (inclusive Canonical XML 1.0) of the element. It can say another thing than
+/// the token does, which is read from the tree: blanks that a comment parts from a value are part of the value there, and
+/// it has the `xml:` attributes that the element inherits, with which `CreateSamlToken` refuses it. The element's tree must
+/// not be changed during the call; the token does not keep it.
 /// @throws Tarvel::Xml::Security::XmlSecurityException when the element has no canonical form.
 SSOCLIENT_API std::shared_ptr<const SamlToken>
 CreateSamlTokenFromDom(const Tarvel::Xml::ElementNode &element,

@@ -130,6 +130,7 @@ bool TryParseRenewRestriction(NodeFilterIterator &iterator, boost::optional<Rene
                                  {LocalName("Count"), LocalName("Postdatable"), LocalName("RenewExpired")});
   restriction.emplace();
   GetULongOptionalAttribute(*element, "Count", restriction->Count);
+  // Content would be signed and not looked at.
   RequireEmptyElement(iterator);
   iterator.MoveToSibling();
   return true;

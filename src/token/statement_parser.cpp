@@ -5,11 +5,27 @@
 #include "xml/qualified_name.h"
 #include "xml/strict_checks.h"
 
+#include <string>
 #include <utility>
 
 namespace SsoClient {
 
 using Tarvel::Xml::ElementNode;
+using Tarvel::Xml::QName;
+
+namespace {
+
+void ParseAttributeValue(NodeFilterIterator &iterator, std::string &value) {
+  const ElementNode &element = RequireElementQName(IteratorToElement(iterator), "AttributeValue", Namespaces::SAML);
+  // Services may say the type of a value. It is not looked at: every value is taken as text.
+  if (element.GetFirstAttribute()) {
+    RequireElementAttributesQNames(element, {}, {QName(std::string(Namespaces::XSI), "type")});
+  }
+  RequireTextualContent(iterator, value);
+  iterator.MoveToSibling();
+}
+
+} // namespace
 
 bool TryParseAdviceElement(NodeFilterIterator &iterator, boost::optional<AdviceType> &advice) {
   const ElementNode *const element = IteratorToElement(iterator);
@@ -75,9 +91,7 @@ void ParseAttributeElement(NodeFilterIterator &iterator, AttributeType &attribut
   attribute.FriendlyName = GetTextAttribute(element, "FriendlyName");
   NodeFilterIterator child = iterator.GetChild();
   while (child.node) {
-    RequireElementQName(IteratorToElement(child), "AttributeValue", Namespaces::SAML);
-    RequireTextualContent(child, attribute.values.emplace_back());
-    child.MoveToSibling();
+    ParseAttributeValue(child, attribute.values.emplace_back());
   }
   iterator.MoveToSibling();
 }

@@ -8,6 +8,7 @@
 #include "input_descriptor.h"
 
 #include <tarvel/core/exception.h>
+#include <tarvel/core/string_util.h>
 #include <tarvel/service/app.h>
 
 #include <nlohmann/json.hpp>
@@ -82,6 +83,10 @@ std::string Printable(std::string_view text) {
   return out;
 }
 
+std::string PrintableLine(std::string_view text) {
+  return Tarvel::StringUtil::Shorten(Printable(text), Tarvel::StringUtil::MAX_LINE_BYTES);
+}
+
 std::string ReadInput(const std::string &path, std::size_t limit) {
   const InputDescriptor file(path);
   std::string content;
@@ -109,13 +114,13 @@ void WriteOutput(std::string_view text) {
 }
 
 void Warn(std::string_view message) {
-  const std::string line = "ssoclient: warning: " + Printable(message) + "\n";
+  const std::string line = "ssoclient: warning: " + PrintableLine(message) + "\n";
   std::fputs(line.c_str(), stderr);
 }
 
 void ShowLibraryLog() {
   Tarvel::Service::GetApp().GetRootLogger()->SetSink([](const Tarvel::Service::LogRecord &record) {
-    const std::string line = "ssoclient: log: " + Printable(record.message) + "\n";
+    const std::string line = "ssoclient: log: " + PrintableLine(record.message) + "\n";
     std::fputs(line.c_str(), stderr);
   });
 }
@@ -126,7 +131,7 @@ void ReportFailure(const std::exception &failure, Format format) {
   if (format == Format::JSON) {
     line = Json({{"schema", 1}, {"error", {{"class", known.className}, {"message", failure.what()}}}});
   } else {
-    line = "ssoclient: " + std::string(known.label) + ": " + Printable(failure.what());
+    line = "ssoclient: " + std::string(known.label) + ": " + PrintableLine(failure.what());
   }
   line += '\n';
   std::fputs(line.c_str(), stderr);

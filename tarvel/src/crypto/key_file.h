@@ -5,6 +5,7 @@
 #pragma once
 
 #include <tarvel/core/secure_wipe.h>
+#include <tarvel/core/string_util.h>
 #include <tarvel/crypto/private_key.h>
 
 #include <string>
@@ -34,13 +35,13 @@ auto NamingPath(const std::string &path, Function function) {
   try {
     return function();
   } catch (const WrongPassphraseException &error) {
-    throw WrongPassphraseException(path + ": " + error.what());
+    throw WrongPassphraseException(StringUtil::Shorten(path) + ": " + error.what());
   } catch (const NoKeyException &error) {
-    throw NoKeyException(path + ": " + error.what());
+    throw NoKeyException(StringUtil::Shorten(path) + ": " + error.what());
   } catch (const CryptoException &error) {
-    throw CryptoException(path + ": " + error.what());
+    throw CryptoException(StringUtil::Shorten(path) + ": " + error.what());
   } catch (const IOException &error) {
-    throw IOException(path + ": " + error.what());
+    throw IOException(StringUtil::Shorten(path) + ": " + error.what());
   }
 }
 

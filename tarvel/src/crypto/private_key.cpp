@@ -11,6 +11,8 @@
 #include "crypto/pem_reader.h"
 #include "crypto/private_key_impl.h"
 
+#include <tarvel/core/string_util.h>
+
 #include <openssl/err.h>
 #include <openssl/pem.h>
 
@@ -181,7 +183,8 @@ void RequireKeyMatchesCertificate(const PrivateKey &key, const Certificate &cert
   const OpenSslErrorScope errors;
   EVP_PKEY *const publicKey = AsImpl(certificate).GetNativeKey();
   if (!publicKey || EVP_PKEY_eq(publicKey, AsImpl(key).GetNative()) != 1) {
-    throw KeyMismatchException("The private key is not the one of the certificate " + certificate.GetSubject());
+    throw KeyMismatchException("The private key is not the one of the certificate " +
+                               StringUtil::Shorten(certificate.GetSubject()));
   }
 }
 

@@ -5,6 +5,7 @@
 #include "core/wiped_growth.h"
 
 #include <tarvel/core/secure_wipe.h>
+#include <tarvel/core/string_util.h>
 
 #include <algorithm>
 #include <array>
@@ -87,11 +88,12 @@ void ClientRequestImpl::SetHeader(std::string_view name, std::string_view value)
     throw InvalidArgumentException("the name of an HTTP header is no token.");
   }
   if (!IsFieldValue(value)) {
-    throw InvalidArgumentException("the value of the HTTP header " + std::string(name) + " holds a control character.");
+    throw InvalidArgumentException("the value of the HTTP header " + StringUtil::Shorten(name) +
+                                   " holds a control character.");
   }
   const auto isName = [name](std::string_view other) { return EqualsIgnoringCase(other, name); };
   if (std::any_of(OWN_HEADERS.begin(), OWN_HEADERS.end(), isName)) {
-    throw InvalidArgumentException("the HTTP header " + std::string(name) + " is set by the user agent.");
+    throw InvalidArgumentException("the HTTP header " + StringUtil::Shorten(name) + " is set by the user agent.");
   }
   const auto same = std::find_if(m_data.headers.begin(), m_data.headers.end(),
                                  [&isName](const auto &header) { return isName(header.first); });

@@ -7,6 +7,7 @@
 #include "system/fork_gate.h"
 
 #include <tarvel/core/exception.h>
+#include <tarvel/core/string_util.h>
 #include <tarvel/system/date_time.h>
 
 #include <algorithm>
@@ -160,7 +161,8 @@ CookieStore::~CookieStore() = default;
 
 void CreateCookieStore(const std::string &name, Ref<CookieStore> &out) {
   if (!name.empty()) {
-    throw InvalidArgumentException("there are no named cookie stores, but \"" + name + "\" was asked for.");
+    throw InvalidArgumentException("there are no named cookie stores, but \"" + StringUtil::Shorten(name) +
+                                   "\" was asked for.");
   }
   out = MakeRef<CookieStoreImpl>();
 }

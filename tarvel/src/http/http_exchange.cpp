@@ -7,6 +7,7 @@
 #include "system/uncaught_exception.h"
 
 #include <tarvel/core/secure_wipe.h>
+#include <tarvel/core/string_util.h>
 #include <tarvel/ssl/ssl_context.h>
 
 #include <algorithm>
@@ -53,8 +54,8 @@ std::string MakeHostHeader(const ConnectionSpec &spec, bool isSecure) {
 
 HttpExchange::HttpExchange(const Ref<ConnectionSpec> &spec, const Ref<CookieStore> &cookies, RequestData request,
                            UserAgent::CompletionFunction completion)
-    : m_spec(spec), m_cookies(cookies), m_endpoint(spec->GetEndpointString()), m_request(std::move(request)),
-      m_reader(m_request.method == "HEAD"), m_completion(std::move(completion)) {
+    : m_spec(spec), m_cookies(cookies), m_endpoint(StringUtil::Shorten(spec->GetEndpointString())),
+      m_request(std::move(request)), m_reader(m_request.method == "HEAD"), m_completion(std::move(completion)) {
   OutOfMemory(); // made while there is memory
 }
 

@@ -5,6 +5,7 @@
 #include "core/wiped_growth.h"
 
 #include <tarvel/core/secure_wipe.h>
+#include <tarvel/core/string_util.h>
 
 #include <boost/asio/buffer.hpp>
 #include <boost/beast/http/basic_parser.hpp>
@@ -58,7 +59,7 @@ void CheckBeginning(std::string_view header) {
 }
 
 std::string DescribeStatus(const ResponseData &response) {
-  return std::to_string(response.status) + (response.reason.empty() ? "" : " ") + response.reason;
+  return std::to_string(response.status) + (response.reason.empty() ? "" : " ") + StringUtil::Shorten(response.reason);
 }
 
 bool IsInterim(int status) noexcept {
@@ -251,8 +252,8 @@ void ResponseReader::ChooseBody() {
 void ResponseReader::CheckContentCoding() const {
   for (const auto &[name, value] : m_data.fields) {
     if (EqualsIgnoringCase(name, "Content-Encoding") && !value.empty() && !EqualsIgnoringCase(value, "identity")) {
-      throw HttpException("its content (status " + DescribeStatus(m_data) + ") is encoded as \"" + value +
-                          "\", which was not asked for");
+      throw HttpException("its content (status " + DescribeStatus(m_data) + ") is encoded as \"" +
+                          StringUtil::Shorten(value) + "\", which was not asked for");
     }
   }
 }

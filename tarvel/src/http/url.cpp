@@ -4,6 +4,8 @@
 
 #include "http/header_syntax.h"
 
+#include <tarvel/core/string_util.h>
+
 #include <libxml/uri.h>
 
 #include <algorithm>
@@ -22,7 +24,6 @@ constexpr int HTTPS_PORT = 443;
 constexpr int MAX_PORT = 65535;
 constexpr std::size_t MAX_HOST_LENGTH = 253; // RFC 1035, section 2.3.4, without the root's dot
 constexpr std::size_t MAX_LABEL_LENGTH = 63;
-constexpr std::size_t MAX_QUOTED_LENGTH = 200; // of a URL in a message
 
 struct UriDeleter {
   void operator()(xmlURI *uri) const { xmlFreeURI(uri); }
@@ -71,11 +72,7 @@ std::string Quote(std::string_view url) {
   }
   std::replace_if(
       text.begin(), text.end(), [](char c) { return IsControlCharacter(c); }, '?');
-  if (text.size() > MAX_QUOTED_LENGTH) {
-    text.resize(MAX_QUOTED_LENGTH);
-    text += "...";
-  }
-  return text;
+  return StringUtil::Shorten(text);
 }
 
 [[noreturn]] void Refuse(std::string_view url, const std::string &reason) {

@@ -3,6 +3,7 @@
 #include <tarvel/io/file_reader.h>
 
 #include <tarvel/core/exception.h>
+#include <tarvel/core/string_util.h>
 
 #include <cerrno>
 #include <fcntl.h>
@@ -15,7 +16,8 @@ namespace Tarvel {
 namespace {
 
 [[noreturn]] void ThrowFor(const char *action, const std::string &name, int error) {
-  throw IOException("Cannot " + std::string(action) + " " + name + ": " + std::system_category().message(error));
+  throw IOException("Cannot " + std::string(action) + " " + StringUtil::Shorten(name) + ": " +
+                    std::system_category().message(error));
 }
 
 class DescriptorReaderImpl : public Reader {

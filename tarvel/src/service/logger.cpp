@@ -2,6 +2,9 @@
 
 #include <tarvel/service/logger.h>
 
+#include <tarvel/core/string_util.h>
+
+#include <new>
 #include <utility>
 
 namespace Tarvel {
@@ -17,8 +20,17 @@ public:
   const std::string &GetName() const noexcept override { return m_name; }
 
   void Write(int level, std::string_view message) noexcept override {
-    if (m_root) {
+    if (!m_root) {
+      return;
+    }
+    if (message.size() <= StringUtil::MAX_LINE_BYTES) {
       m_root->Write({m_name, level, message});
+      return;
+    }
+    try {
+      m_root->Write({m_name, level, StringUtil::Shorten(message, StringUtil::MAX_LINE_BYTES)});
+    } catch (const std::bad_alloc &) {
+      // The line is lost, the operation that it reports is not.
     }
   }
 

@@ -4,6 +4,7 @@
 
 #include "crypto/openssl_errors.h"
 
+#include <tarvel/core/string_util.h>
 #include <tarvel/ssl/ssl_context.h>
 
 #include <openssl/crypto.h>
@@ -99,7 +100,7 @@ ServerIdentity::ServerIdentity(const std::string &host, const std::string &param
   if (!parameter.empty()) {
     m_thumbprint = NormaliseThumbprint(parameter);
     if (m_thumbprint.empty()) {
-      throw SSLException("the SSL parameter \"" + parameter +
+      throw SSLException("the SSL parameter \"" + StringUtil::Shorten(parameter) +
                          "\" is not a SHA-256 thumbprint of 64 hexadecimal digits");
     }
   }

@@ -8,6 +8,7 @@
 #include "system/uncaught_exception.h"
 
 #include <tarvel/core/exception.h>
+#include <tarvel/core/string_util.h>
 
 #include <boost/asio/dispatch.hpp>
 #include <boost/asio/post.hpp>
@@ -41,7 +42,7 @@ std::string DescribeSubject(X509 *certificate) {
   }
   char *data = nullptr;
   const long length = BIO_get_mem_data(text.get(), &data);
-  return {data, static_cast<std::size_t>(length)};
+  return StringUtil::Shorten({data, static_cast<std::size_t>(length)});
 }
 
 template <typename Handler, typename... Args>

@@ -3,6 +3,7 @@
 #include "system/date_time_text.h"
 
 #include <tarvel/core/exception.h>
+#include <tarvel/core/string_util.h>
 
 #include <algorithm>
 #include <string>
@@ -13,7 +14,6 @@ namespace System {
 namespace {
 
 /// Bytes of a refused text that its message repeats: the text may be as long as a document.
-constexpr std::size_t MAX_QUOTED_LENGTH = 64;
 
 constexpr int MAX_BIAS_HOURS = 14;
 
@@ -140,12 +140,9 @@ DateTimeFields ParseDateTimeText(std::string_view text) {
 }
 
 void RefuseDateTimeText(std::string_view text, std::string_view reason) {
-  std::string quoted(text.substr(0, MAX_QUOTED_LENGTH));
+  std::string quoted = StringUtil::Shorten(text);
   // A message is read as a C string: a NUL would end it before its reason.
   std::replace(quoted.begin(), quoted.end(), '\0', '?');
-  if (text.size() > MAX_QUOTED_LENGTH) {
-    quoted += "...";
-  }
   throw DateTimeFormatException("\"" + quoted + "\" is not a date-time: " + std::string(reason));
 }
 

@@ -6,6 +6,7 @@
 #include "system/shared_lookup.h"
 
 #include <tarvel/core/exception.h>
+#include <tarvel/core/string_util.h>
 
 #include <boost/asio/buffer.hpp>
 #include <boost/asio/error.hpp>
@@ -66,7 +67,7 @@ asio::ip::address ParseAddress(const std::string &host, error_code &error) {
 std::string DescribeTarget(const std::string &host, int port) {
   error_code notAnAddress;
   const bool needsBrackets = ParseAddress(host, notAnAddress).is_v6() && host.front() != '[';
-  return (needsBrackets ? "[" + host + "]" : host) + ":" + std::to_string(port);
+  return (needsBrackets ? "[" + host + "]" : StringUtil::Shorten(host)) + ":" + std::to_string(port);
 }
 
 template <typename Failure>

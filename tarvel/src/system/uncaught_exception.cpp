@@ -5,6 +5,7 @@
 #include "core/demangle.h"
 #include "system/fork_gate.h"
 
+#include <tarvel/core/string_util.h>
 #include <tarvel/service/app.h>
 #include <tarvel/service/logger.h>
 
@@ -22,7 +23,7 @@ std::string DescribeCurrentException() {
   try {
     throw;
   } catch (const std::exception &exception) {
-    return Demangle(typeid(exception).name()) + ": " + exception.what();
+    return Demangle(typeid(exception).name()) + ": " + StringUtil::Shorten(exception.what());
   } catch (...) {
     return "an object that is no exception";
   }

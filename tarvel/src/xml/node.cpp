@@ -6,6 +6,7 @@
 #include "xml/node_arena.h"
 
 #include <tarvel/core/exception.h>
+#include <tarvel/core/string_util.h>
 
 #include <string>
 
@@ -30,7 +31,7 @@ void RequireXmlText(std::string_view what, std::string_view text) {
 
 void RequireNcName(std::string_view what, std::string_view name) {
   if (!IsNcName(name)) {
-    throw InvalidArgumentException(std::string(what) + " '" + std::string(name) +
+    throw InvalidArgumentException(std::string(what) + " '" + StringUtil::Shorten(name) +
                                    "' is not an XML name without a colon");
   }
 }
@@ -178,12 +179,12 @@ void ElementNode::DefineAttribute(std::string_view qualifiedName, std::string_vi
   const bool hasPrefix = colon != std::string_view::npos;
   if ((hasPrefix && !IsNcName(qualifiedName.substr(0, colon))) ||
       !IsNcName(hasPrefix ? qualifiedName.substr(colon + 1) : qualifiedName)) {
-    throw InvalidArgumentException("the attribute name '" + std::string(qualifiedName) +
+    throw InvalidArgumentException("the attribute name '" + StringUtil::Shorten(qualifiedName) +
                                    "' is not a qualified XML name");
   }
   const std::string refusal = DescribeForbiddenCharacter("", value);
   if (!refusal.empty()) {
-    throw InvalidArgumentException("the value of the attribute '" + std::string(qualifiedName) + "'" + refusal);
+    throw InvalidArgumentException("the value of the attribute '" + StringUtil::Shorten(qualifiedName) + "'" + refusal);
   }
   for (Attribute *attribute = m_firstAttribute; attribute; attribute = attribute->m_next) {
     if (attribute->m_name == qualifiedName) {

@@ -4,6 +4,8 @@
 
 #include "system/fork_gate.h"
 
+#include <tarvel/core/string_util.h>
+
 #include <libxml/SAX2.h>
 #include <libxml/parserInternals.h>
 #include <libxml/xmlerror.h>
@@ -20,7 +22,6 @@ namespace Xml {
 namespace {
 
 constexpr std::size_t NPOS = std::string_view::npos;
-constexpr std::size_t LONGEST_FOREIGN_DETAIL = 300;
 
 // Our limits stand in place of libxml2's; the encoding is judged before. Without XML_PARSE_NOENT an ampersand in an attribute
 // value would be reported as "&#38;". There are no other entities that the option could replace: a document type
@@ -44,22 +45,14 @@ const char *FindCharacter(const char *begin, const char *end, char character) no
   return static_cast<const char *>(std::memchr(begin, character, static_cast<std::size_t>(end - begin)));
 }
 
-/// libxml2's words for an error, in one line and at a readable length, cut between two characters.
+/// libxml2's words for an error, in one line and at a readable length.
 std::string GetDetail(const xmlError &error) {
   std::string detail = error.message ? error.message : "the document is not well-formed";
-  if (detail.size() > LONGEST_FOREIGN_DETAIL) {
-    std::size_t end = LONGEST_FOREIGN_DETAIL;
-    while ((static_cast<unsigned char>(detail[end]) & 0xC0) == 0x80) {
-      --end;
-    }
-    detail.resize(end);
-    detail += "...";
-  }
   while (!detail.empty() && detail.back() == '\n') {
     detail.pop_back();
   }
   std::replace(detail.begin(), detail.end(), '\n', ' ');
-  return detail;
+  return StringUtil::Shorten(detail);
 }
 
 /// Gives a host that uses libxml2 itself its thread's last error back, which each of our errors would replace.

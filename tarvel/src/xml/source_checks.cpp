@@ -4,6 +4,7 @@
 
 #include "xml/characters.h"
 
+#include <tarvel/core/string_util.h>
 #include <tarvel/xml/parser.h>
 
 #include <algorithm>
@@ -110,13 +111,13 @@ void CheckDeclaration(std::string_view source) {
   while (pair.Next()) {
     const std::size_t offset = static_cast<std::size_t>(pair.value.data() - source.data());
     if (pair.name == "version" && pair.value != "1.0") {
-      Refuse("the XML version '" + std::string(pair.value.substr(0, 20)) + "' is not 1.0", source, offset);
+      Refuse("the XML version '" + StringUtil::Shorten(pair.value) + "' is not 1.0", source, offset);
     }
     if (pair.name != "encoding" || EqualsIgnoringCase(pair.value, "UTF-8")) {
       continue;
     }
     if (!EqualsIgnoringCase(pair.value, "US-ASCII")) {
-      Refuse("the encoding '" + std::string(pair.value.substr(0, 40)) + "' is declared, only UTF-8 is accepted", source,
+      Refuse("the encoding '" + StringUtil::Shorten(pair.value) + "' is declared, only UTF-8 is accepted", source,
              offset);
     }
     const std::size_t nonAscii = FindNonAscii(source.substr(begin));

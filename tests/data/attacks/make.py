@@ -5,11 +5,15 @@
 Most are a genuine token that an attacker changed after the service had signed it; some are signed, with openssl and
 xmlsec1, by a key that is not trusted, or by the trusted key with an algorithm that must be refused. What becomes of
 each is written down in expected.tsv.
+
+usage: make.py [GROUP...]   GROUP is a function at the end of this file; without one, all of them. Some documents differ
+from run to run, because a key is made for them.
 """
 import base64
 import os
 import re
 import subprocess
+import sys
 import tempfile
 
 HERE = os.path.dirname(os.path.abspath(__file__))
@@ -342,6 +346,34 @@ def signature_values():
         write(f'ecdsa-value-{name}', change(ecdsa, ec_value, base64.b64encode(octets).decode()))
 
 
+def resigned_digests():
+    """The trusted key signed a digest that does not fit: only the comparison of the digest is left to notice.
+
+    xmlsec1 writes digests of its own making when it signs. So it only canonicalises SignedInfo here, and openssl signs
+    those octets with another digest in them.
+    """
+    with tempfile.TemporaryDirectory() as folder:
+        source, octets = os.path.join(folder, 'in.xml'), os.path.join(folder, 'octets')
+        with open(source, 'w', encoding='utf-8') as file:
+            file.write(blank(bearer))
+        log = run('xmlsec1', '--sign', '--store-signatures', '--privkey-pem', f'{key("sts-rsa")}.key,{key("sts-rsa")}.crt',
+                  '--id-attr:ID', ASSERTION, '--output', '/dev/null', source).decode()
+        signed_info = re.search(r'== PreSigned data - start buffer:\n(.*)\n== PreSigned data - end buffer', log, re.S).group(1)
+        digest = re.search(r'<ds:DigestValue>([^<]*)</ds:DigestValue>', bearer).group(1)
+        value = re.search(r'<ds:SignatureValue>([^<]*)</ds:SignatureValue>', bearer).group(1)
+        raw = base64.b64decode(digest)
+        for name, octets_of_digest in (('unchanged', raw), ('one-octet', raw[:1]), ('31-octets', raw[:-1]),
+                                       ('one-octet-more', raw + b'\0'), ('32-zeros-more', raw + bytes(32)),
+                                       ('first-bit', bytes([raw[0] ^ 0x80]) + raw[1:]),
+                                       ('last-bit', raw[:-1] + bytes([raw[-1] ^ 1]))):
+            other = base64.b64encode(octets_of_digest).decode()
+            with open(octets, 'w', encoding='utf-8') as file:
+                file.write(change(signed_info, digest, other))
+            other_value = run('openssl', 'dgst', '-sha256', '-sign', key('sts-rsa.key'), octets)
+            write(f'digest-resigned-{name}', change(change(bearer, digest, other), value,
+                                                    base64.b64encode(other_value).decode()))
+
+
 def foreign_keys():
     """Signed by the attacker's own key, which the token itself offers for the check."""
     template = blank(change(bearer, 'alice@corp.example', 'admin@corp.example'))
@@ -393,13 +425,8 @@ def documents():
     write('soap-fault', '<s:Envelope xmlns:s="http://schemas.xmlsoap.org/soap/envelope/"><s:Body><s:Fault/></s:Body></s:Envelope>')
 
 
-wrapping()
-duplicate_ids()
-entities()
-splitting()
-namespaces()
-algorithms()
-signature_values()
-foreign_keys()
-unsigned_tokens()
-documents()
+GROUPS = (wrapping, duplicate_ids, entities, splitting, namespaces, algorithms, signature_values, resigned_digests,
+          foreign_keys, unsigned_tokens, documents)
+for group in GROUPS:
+    if len(sys.argv) == 1 or group.__name__ in sys.argv[1:]:
+        group()

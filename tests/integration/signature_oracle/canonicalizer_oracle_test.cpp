@@ -1,6 +1,8 @@
 // SPDX-License-Identifier: Apache-2.0
-// Each algorithm on generated documents, whole and in part, beside libxml2's C14N.
+// Each algorithm on generated documents, whole and in part, beside libxml2's C14N and beside forms written from expat's
+// events, which have libxml2's parser on neither side.
 
+#include "expat_oracle.h"
 #include "generated_document.h"
 #include "libxml2_oracle.h"
 
@@ -14,7 +16,10 @@
 
 #include <gtest/gtest.h>
 
+#include <optional>
 #include <ostream>
+#include <string>
+#include <vector>
 
 namespace {
 
@@ -60,6 +65,47 @@ const Node *ElementAt(const Document &document, std::size_t index) {
   }
 }
 
+/// What is canonicalised of a document, and how.
+struct Form {
+  bool isPart;
+  std::size_t apex; ///< of the part
+  bool omits;
+  std::size_t omitted;
+  CanonicalMethod method;
+  std::vector<std::string> prefixes;
+};
+
+Form ChooseForm(Testing::RandomSource &random, std::string_view uri, std::size_t elements) {
+  Form form{};
+  form.isPart = random.OnceIn(2);
+  form.omits = random.OnceIn(4);
+  form.apex = random.Below(elements);
+  // Not above the apex: then nothing would be left.
+  const std::size_t lowest = form.isPart ? form.apex : 0;
+  form.omitted = lowest + random.Below(elements - lowest);
+  EXPECT_TRUE(Tarvel::Xml::Security::FindCanonicalMethod(uri, form.method));
+  if (form.method.isExclusive) {
+    form.prefixes = Testing::GeneratePrefixList(random);
+  }
+  Tarvel::Xml::Security::SetInclusivePrefixes(form.method, form.prefixes);
+  return form;
+}
+
+std::string OurForm(const std::string &text, const Form &form) {
+  const Ref<Document> document = Parse(text);
+  const Ref<Tarvel::StringWriter> writer = Tarvel::CreateStringWriter();
+  Tarvel::Xml::Security::WriteCanonicalForm(
+      form.isPart ? *ElementAt(*document, form.apex) : *document->GetDocumentNode(), form.method,
+      form.omits ? ElementAt(*document, form.omitted) : nullptr, *writer);
+  return writer->TakeText();
+}
+
+std::string Describe(const Form &form, const std::string &text) {
+  return "part " + std::to_string(form.isPart) + " " + std::to_string(form.apex) + ", omits " +
+         std::to_string(form.omits) + " " + std::to_string(form.omitted) + ", prefixes " +
+         ::testing::PrintToString(form.prefixes) + "\n" + text;
+}
+
 class CanonicalizerOracle : public ::testing::TestWithParam<Algorithm> {};
 
 TEST_P(CanonicalizerOracle, WritesWhatLibxml2WritesForGeneratedDocuments) {
@@ -67,36 +113,35 @@ TEST_P(CanonicalizerOracle, WritesWhatLibxml2WritesForGeneratedDocuments) {
   std::size_t parts = 0;
   for (std::size_t count = 0; count < DOCUMENTS; ++count) {
     const Testing::GeneratedDocument generated = Testing::GenerateDocument(random);
-    const bool isPart = random.OnceIn(2);
-    const bool omits = random.OnceIn(4);
-    const std::size_t apexIndex = random.Below(generated.elements);
-    // Not above the apex: then nothing would be left.
-    const std::size_t lowest = isPart ? apexIndex : 0;
-    const std::size_t omittedIndex = lowest + random.Below(generated.elements - lowest);
-    CanonicalMethod method;
-    ASSERT_TRUE(Tarvel::Xml::Security::FindCanonicalMethod(GetParam().uri, method));
-    const std::vector<std::string> prefixes =
-        method.isExclusive ? Testing::GeneratePrefixList(random) : std::vector<std::string>();
-    Tarvel::Xml::Security::SetInclusivePrefixes(method, prefixes);
-
+    const Form form = ChooseForm(random, GetParam().uri, generated.elements);
     const Testing::XmlDocHandle theirs = Testing::ParseWithLibxml2(generated.text);
     ASSERT_TRUE(theirs) << generated.text;
     const std::string expected =
-        Testing::CanonicalFormOfLibxml2(*theirs, isPart ? Testing::ElementOfLibxml2(*theirs, apexIndex) : nullptr,
-                                        omits ? Testing::ElementOfLibxml2(*theirs, omittedIndex) : nullptr,
-                                        {method.isExclusive, method.withComments, prefixes});
-
-    const Ref<Document> ours = Parse(generated.text);
-    const Ref<Tarvel::StringWriter> writer = Tarvel::CreateStringWriter();
-    Tarvel::Xml::Security::WriteCanonicalForm(isPart ? *ElementAt(*ours, apexIndex) : *ours->GetDocumentNode(), method,
-                                              omits ? ElementAt(*ours, omittedIndex) : nullptr, *writer);
-    ASSERT_EQ(expected, writer->GetText())
-        << "document " << count << ", part " << isPart << " " << apexIndex << ", omits " << omits << " " << omittedIndex
-        << ", prefixes " << ::testing::PrintToString(prefixes) << "\n"
-        << generated.text;
-    parts += isPart && !expected.empty() ? 1u : 0u;
+        Testing::CanonicalFormOfLibxml2(*theirs, form.isPart ? Testing::ElementOfLibxml2(*theirs, form.apex) : nullptr,
+                                        form.omits ? Testing::ElementOfLibxml2(*theirs, form.omitted) : nullptr,
+                                        {form.method.isExclusive, form.method.withComments, form.prefixes});
+    ASSERT_EQ(expected, OurForm(generated.text, form))
+        << "document " << count << ", " << Describe(form, generated.text);
+    parts += form.isPart && !expected.empty() ? 1u : 0u;
   }
   EXPECT_GT(parts, DOCUMENTS / 4);
+}
+
+TEST_P(CanonicalizerOracle, WritesWhatExpatsEventsGiveForGeneratedDocuments) {
+  Testing::RandomSource random(GetParam().seed + 100);
+  std::size_t lengthy = 0;
+  for (std::size_t count = 0; count < DOCUMENTS; ++count) {
+    const Testing::GeneratedDocument generated = Testing::GenerateDocument(random, Testing::NamespaceNames::ANY);
+    const Form form = ChooseForm(random, GetParam().uri, generated.elements);
+    const std::optional<std::string> expected = Testing::CanonicalFormByExpat(
+        generated.text, form.isPart ? form.apex : Testing::NO_ELEMENT, form.omits ? form.omitted : Testing::NO_ELEMENT,
+        {form.method.isExclusive, form.method.withComments, form.prefixes});
+    ASSERT_TRUE(expected) << generated.text;
+    ASSERT_EQ(*expected, OurForm(generated.text, form))
+        << "document " << count << ", " << Describe(form, generated.text);
+    lengthy += expected->size() > 4096 ? 1u : 0u;
+  }
+  EXPECT_GT(lengthy, DOCUMENTS / 200);
 }
 
 constexpr Algorithm ALGORITHMS[] = {{"Inclusive", Uri::INCLUSIVE, 1},

@@ -12,12 +12,17 @@ namespace {
 
 constexpr std::size_t MAX_ELEMENTS = 14;
 constexpr std::size_t MAX_DEPTH = 6;
+// The canonicaliser's buffer has 4096 octets, and its table of prefixes 128 places: some documents are beyond both.
+constexpr std::size_t LONG_TEXT = 4080;
+constexpr std::size_t SPREAD_OF_LONG_TEXTS = 32;
+constexpr std::size_t MANY_PREFIXES = 17;
+constexpr std::size_t SPREAD_OF_MANY_PREFIXES = 150;
 
 constexpr std::string_view PREFIXES[] = {"a", "b", "n0", "_", "x-1.y", "\xC3\xA9", "A", "aa"};
-// libxml2 canonicalises only namespace names that are URIs, so there are no characters beyond ASCII; and it writes them without
-// the escapes that the recommendation wants, so there is no ampersand.
 constexpr std::string_view NAMESPACES[] = {"urn:a",      "urn:b", "http://example.com/?a=1;b='2'",
                                            "urn:%C3%BC", "URN:A", "urn:a:b"};
+// libxml2 parses only namespace names that are URIs, and writes them without the escapes that the recommendation wants.
+constexpr std::string_view ODD_NAMESPACES[] = {"urn:a?b&amp;c", "urn:&#38;", "http://example.com/?a=&amp;lt;"};
 constexpr std::string_view LOCAL_NAMES[] = {"a", "b", "item", "B", "z.9", "_x", "\xD0\xB6"};
 constexpr std::string_view TEXT_PIECES[] = {"text",         " ",
                                             "\n",           "\t",
@@ -39,7 +44,8 @@ constexpr std::string_view XML_ATTRIBUTES[] = {" xml:lang='en'", " xml:lang=\"de
 
 class Generator {
 public:
-  explicit Generator(RandomSource &random) : m_random(random) {}
+  Generator(RandomSource &random, NamespaceNames names)
+      : m_random(random), m_names(names), m_isLong(random.OnceIn(32)), m_isCrowded(random.OnceIn(16)) {}
 
   GeneratedDocument Generate() {
     if (m_random.OnceIn(3)) {
@@ -71,7 +77,7 @@ private:
 
   void WriteInstruction() {
     Put("<?target");
-    Put(m_random.OneOf({"", " ", " data", "   data  with=\"x\" & <  "}));
+    Put(m_random.OneOf({"", " ", " x", " data", "   data  with=\"x\" & <  "}));
     Put("?>");
   }
 
@@ -86,7 +92,12 @@ private:
     }
   }
 
-  void WriteText() { PutPieces(TEXT_PIECES); }
+  void WriteText() {
+    PutPieces(TEXT_PIECES);
+    if (m_isLong && m_random.OnceIn(2)) {
+      m_document.text.append(LONG_TEXT + m_random.Below(SPREAD_OF_LONG_TEXTS), 'x');
+    }
+  }
 
   void WriteCData() {
     Put("<![CDATA[");
@@ -96,14 +107,23 @@ private:
 
   void Declare(Scope &scope, std::string &tag, std::set<std::string, std::less<>> &declared) {
     const bool isDefault = m_random.OnceIn(3);
-    const std::string prefix(isDefault ? std::string_view() : m_random.OneOf(PREFIXES));
+    DeclarePrefix(isDefault ? std::string() : std::string(m_random.OneOf(PREFIXES)), scope, tag, declared);
+  }
+
+  void DeclarePrefix(const std::string &prefix, Scope &scope, std::string &tag,
+                     std::set<std::string, std::less<>> &declared) {
     if (!declared.insert(prefix).second) {
       return;
     }
-    const std::string uri(isDefault && m_random.OnceIn(3) ? std::string_view() : m_random.OneOf(NAMESPACES));
+    const std::string uri(prefix.empty() && m_random.OnceIn(3) ? std::string_view() : NamespaceName());
     scope[prefix] = uri;
     tag += prefix.empty() ? " xmlns" : " xmlns:" + prefix;
     tag += "=\"" + uri + "\"";
+  }
+
+  std::string_view NamespaceName() {
+    const bool isOdd = m_names == NamespaceNames::ANY && m_random.OnceIn(3);
+    return isOdd ? m_random.OneOf(ODD_NAMESPACES) : m_random.OneOf(NAMESPACES);
   }
 
   std::string AttributeValue() {
@@ -133,6 +153,11 @@ private:
     std::set<std::string, std::less<>> declared;
     for (std::size_t count = m_random.Below(3); count != 0; --count) {
       Declare(scope, attributes, declared);
+    }
+    if (m_isCrowded && m_document.elements == 0) {
+      for (std::size_t count = MANY_PREFIXES + m_random.Below(SPREAD_OF_MANY_PREFIXES); count != 0; --count) {
+        DeclarePrefix("p" + std::to_string(m_random.Below(1000)), scope, attributes, declared);
+      }
     }
     attributes += " ID=\"e" + std::to_string(m_document.elements++) + "\"";
     if (m_random.OnceIn(4)) {
@@ -178,13 +203,16 @@ private:
   }
 
   RandomSource &m_random;
+  const NamespaceNames m_names;
+  const bool m_isLong;
+  const bool m_isCrowded;
   GeneratedDocument m_document;
 };
 
 } // namespace
 
-GeneratedDocument GenerateDocument(RandomSource &random) {
-  return Generator(random).Generate();
+GeneratedDocument GenerateDocument(RandomSource &random, NamespaceNames names) {
+  return Generator(random, names).Generate();
 }
 
 std::vector<std::string> GeneratePrefixList(RandomSource &random) {

@@ -15,14 +15,19 @@ namespace Testing {
 
 /// A well-formed document without a document type declaration: namespaces declared, declared again and undeclared, default
 /// namespaces, xml: attributes, CDATA sections, comments, processing instructions, references, carriage returns, characters
-/// of all lengths. Each element has an attribute ID: "e0" for the document element, then "e1" and so on in document order.
+/// of all lengths; some have texts of more than 4096 octets, and some more prefixes than 16 in scope. Each element has an attribute ID: "e0" for the document element, then "e1" and so on in document order.
 struct GeneratedDocument {
   std::string text;
   std::size_t elements = 0;
   std::size_t endOfRoot = 0; ///< where the end tag of the document element begins
 };
 
-GeneratedDocument GenerateDocument(RandomSource &random);
+enum class NamespaceNames {
+  PLAIN, ///< URIs without a character that is escaped in an attribute value
+  ANY    ///< other names as well
+};
+
+GeneratedDocument GenerateDocument(RandomSource &random, NamespaceNames names = NamespaceNames::PLAIN);
 
 /// Prefixes that the documents declare, some never declared among them, and "#default": for InclusiveNamespaces.
 std::vector<std::string> GeneratePrefixList(RandomSource &random);

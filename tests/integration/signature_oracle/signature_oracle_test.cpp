@@ -151,7 +151,7 @@ void CompareOnGeneratedDocuments(const SignedBy &signedBy, const Signer &sign, c
   EXPECT_GT(tally.genuine, signedBy.documents / 4);
   EXPECT_GT(tally.refused, signedBy.documents / 4);
   EXPECT_LT(tally.stricter, signedBy.documents / 20);
-  EXPECT_LT(tally.notComparable, signedBy.documents / 100);
+  EXPECT_LT(tally.notComparable, signedBy.documents / 50);
   ::testing::Test::RecordProperty("genuine", std::to_string(tally.genuine));
   ::testing::Test::RecordProperty("refused", std::to_string(tally.refused));
   ::testing::Test::RecordProperty("stricter", std::to_string(tally.stricter));

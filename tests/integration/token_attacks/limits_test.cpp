@@ -154,6 +154,21 @@ TEST(Limits, ManyReferencesInASignatureAreRefusedBeforeAnyIsDigested) {
   EXPECT_NE("undocumented", outcome.exceptionClass) << outcome;
 }
 
+TEST(Limits, AMillionInclusivePrefixesAreRefusedWithoutAListOfThem) {
+  const std::string list = Repeated("a ", 1'000'000);
+  const std::string transform = "<ds:Transform Algorithm=\"http://www.w3.org/2001/10/xml-exc-c14n#\"";
+  const Counted counted = CountToken(
+      Replaced(ReadToken("bearer"), transform + "/>",
+               transform + "><InclusiveNamespaces xmlns=\"http://www.w3.org/2001/10/xml-exc-c14n#\" PrefixList=\"" +
+                   list + "\"/></ds:Transform>"));
+  EXPECT_EQ(
+      (Outcome{"InvalidSignatureException", "Signature verification error. The PrefixList of the algorithm "
+                                            "\"http://www.w3.org/2001/10/xml-exc-c14n#\" has more than 256 prefixes"}),
+      counted.outcome);
+  // Texts of the document's length, and nothing for each prefix.
+  EXPECT_LT(counted.octets, 10 * list.size());
+}
+
 TEST(Limits, OneHundredThousandGroupsAreReadAtACostInProportion) {
   const auto withGroups = [](int count) {
     const std::string value = "<saml:AttributeValue>corp.example\\Users</saml:AttributeValue>";

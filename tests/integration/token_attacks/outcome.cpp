@@ -2,6 +2,7 @@
 #include "outcome.h"
 
 #include "support/data_file.h"
+#include "support/facts_of.h"
 #include "xml/parse_xml.h"
 
 #include <ssoclient/create_saml_token.h>
@@ -9,10 +10,8 @@
 #include <tarvel/xml/parser.h>
 #include <tarvel/xml/security/exceptions.h>
 
-#include <sstream>
 #include <stdexcept>
 #include <typeinfo>
-#include <vector>
 
 namespace Attacks {
 namespace {
@@ -40,16 +39,12 @@ std::string ClassOf(const std::exception &failure) {
 template <typename Factory>
 Outcome Try(const Factory &factory) {
   try {
-    return {"", FactsOf(*factory())};
+    return {"", Testing::FactsOf(*factory())};
   } catch (const std::exception &failure) {
     return {ClassOf(failure), failure.what()};
   } catch (...) {
     return {"undocumented", "no std::exception"};
   }
-}
-
-void AppendPrincipal(std::ostream &out, const char *label, const PrincipalId &principal) {
-  out << label << " {" << principal.name << "} {" << principal.domain << "}\n";
 }
 
 const Tarvel::Xml::Node *NextInDocumentOrder(const Tarvel::Xml::Node *node) {
@@ -77,50 +72,6 @@ const Tarvel::Xml::ElementNode &FindAssertion(const Tarvel::Xml::Document &docum
 
 std::ostream &operator<<(std::ostream &out, const Outcome &outcome) {
   return out << (outcome.IsAccepted() ? "accepted" : outcome.exceptionClass) << '\t' << outcome.text;
-}
-
-std::string FactsOf(const SamlToken &token) {
-  std::ostringstream out;
-  out << "id {" << token.GetId() << "}\n";
-  AppendPrincipal(out, "subject", token.GetSubject());
-  out << "from " << token.GetStartDate().GetUtcTime() << " to " << token.GetEndDate().GetUtcTime() << '\n';
-  out << "flags " << token.IsRenewable() << token.IsDelegable() << token.IsSolution() << token.GetConfirmationMethod()
-      << '\n';
-  std::pair<std::string, std::string> fullName;
-  token.GetFullName(fullName);
-  out << "name {" << fullName.first << "} {" << fullName.second << "}\n";
-  std::vector<PrincipalId> groups;
-  token.GetGroups(groups);
-  for (const PrincipalId &group : groups) {
-    AppendPrincipal(out, "group", group);
-  }
-  std::vector<Delegate> chain;
-  token.GetDelegationChain(chain);
-  for (const Delegate &delegate : chain) {
-    AppendPrincipal(out, "delegate", delegate.subject);
-    out << "at " << delegate.delegationInstant.GetUtcTime() << '\n';
-  }
-  std::set<std::string> audience;
-  token.GetAudience(audience);
-  for (const std::string &text : audience) {
-    out << "audience {" << text << "}\n";
-  }
-  std::vector<Advice> advice;
-  token.GetAdvice(advice);
-  for (const Advice &one : advice) {
-    out << "advice {" << one.source << "}\n";
-    for (const AdviceAttribute &attribute : one.attributes) {
-      out << "attribute {" << attribute.name << "}";
-      for (const std::string &value : attribute.values) {
-        out << " {" << value << "}";
-      }
-      out << '\n';
-    }
-  }
-  if (token.GetConfirmationCertificate()) {
-    out << "certificate " << token.GetConfirmationCertificate()->GetSha256Thumbprint() << '\n';
-  }
-  return out.str();
 }
 
 const Tarvel::Crypto::CertificateList &Trusted() {

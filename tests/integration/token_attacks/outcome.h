@@ -4,7 +4,6 @@
 
 #pragma once
 
-#include <ssoclient/saml_token.h>
 #include <tarvel/crypto/certificate.h>
 #include <tarvel/xml/node.h>
 
@@ -24,9 +23,6 @@ struct Outcome {
 };
 
 std::ostream &operator<<(std::ostream &out, const Outcome &outcome);
-
-/// Everything that `token` answers, but for its XML.
-std::string FactsOf(const SsoClient::SamlToken &token);
 
 /// The service's certificates that the fixtures are signed with, one of each algorithm; not "other".
 const Tarvel::Crypto::CertificateList &Trusted();

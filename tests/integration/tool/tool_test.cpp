@@ -465,5 +465,51 @@ TEST(Tool, ListsItsCommandsAndExitCodesInTheHelp) {
 )"));
 }
 
+// A line of a terminal, and a value of 15 MiB: text for people is cut, JSON for programs is whole.
+
+const std::string LONG_VALUE(15u * 1024 * 1024, 'x');
+
+std::string WithLongValue(const std::string &from) {
+  std::string token = ReadDataFile("tokens/bearer.xml");
+  return token.replace(token.find(from), from.size(), LONG_VALUE);
+}
+
+TEST(LongValues, AreCutInALineAboutAFailureAndWholeInItsJson) {
+  const std::string token = WithLongValue("urn:oasis:names:tc:SAML:2.0:cm:bearer");
+  const std::string message = "Unknown subject confirmation method: '";
+  const Result text = RunTool({"inspect", "-"}, token);
+  EXPECT_EQ(5, text.exitCode);
+  EXPECT_TRUE(text.err == "ssoclient: token invalid: " + message + std::string(7168 - message.size(), 'x') + "... (" +
+                              std::to_string(message.size() + LONG_VALUE.size() + 1 - 7168) + " more bytes)\n")
+      << text.err.size() << " " << text.err.substr(0, 100);
+  EXPECT_LT(text.err.size(), 8u * 1024);
+  const Result json = RunTool({"inspect", "--format", "json", "-"}, token);
+  EXPECT_NE(std::string::npos, json.err.find(LONG_VALUE));
+}
+
+TEST(LongValues, AreCutAfterTheyWereEscaped) {
+  std::string token = ReadDataFile("tokens/bearer.xml");
+  const std::string method = "urn:oasis:names:tc:SAML:2.0:cm:bearer";
+  std::string tabs;
+  for (int count = 0; count < 100'000; ++count) {
+    tabs += "&#9;";
+  }
+  token.replace(token.find(method), method.size(), tabs);
+  const Result text = RunTool({"inspect", "-"}, token);
+  EXPECT_EQ(5, text.exitCode);
+  EXPECT_LT(text.err.size(), 8u * 1024);
+}
+
+TEST(LongValues, AreCutInTheTextOfATokenAndWholeInItsJson) {
+  const std::string token = WithLongValue("https://files.corp.example/");
+  const Result text = RunTool({"inspect", "-"}, token);
+  EXPECT_EQ(0, text.exitCode);
+  EXPECT_TRUE(text.out.find("\nAudience:        " + std::string(7168, 'x') + "... (15721472 more bytes)\n") !=
+              std::string::npos);
+  EXPECT_LT(text.out.size(), 10u * 1024);
+  const Result json = RunTool({"inspect", "--format", "json", "-"}, token);
+  EXPECT_NE(std::string::npos, json.out.find(LONG_VALUE));
+}
+
 } // namespace
 } // namespace ToolTest

@@ -6,6 +6,7 @@
 #include <gtest/gtest.h>
 
 #include <memory>
+#include <string>
 #include <type_traits>
 #include <typeinfo>
 
@@ -83,7 +84,15 @@ TYPED_TEST(EachException, ClonesAndThrowsAsItsOwnClass) {
 
 TYPED_TEST(EachException, KeepsWhatThePlatformKeeps) {
   const TypeParam exception("the message");
-  EXPECT_NE(exception.Dump().find("the message"), std::string::npos);
+  EXPECT_STREQ("the message", exception.what());
+  EXPECT_NE("", exception.GetBacktrace());
+  EXPECT_EQ(::testing::internal::GetTypeName<TypeParam>() + ": the message\n" + exception.GetBacktrace(),
+            exception.Dump());
+  EXPECT_NE("", exception.Where());
+  EXPECT_NE(std::string::npos, exception.GetBacktrace().find(exception.Where()));
+  const TypeParam copy(exception);
+  EXPECT_EQ(exception.GetBacktrace(), copy.GetBacktrace());
+  EXPECT_EQ(exception.Where(), copy.Where());
 }
 
 } // namespace

@@ -134,8 +134,9 @@ INSTANTIATE_TEST_SUITE_P(
                            NOT_ASCII},
                     BadUrl{"https://\xF0\x9F\x94\x91.example/", NOT_ASCII},
                     BadUrl{"https://" + LABEL_63 + "a/", "a part of the host name is longer than 63 characters"},
-                    BadUrl{"https://" + HOST_253 + "b/", "the host name is longer than 253 characters",
-                           "https://" + HOST_253.substr(0, 192) + "..."}));
+                    BadUrl{"https://" + HOST_253 + "b/", "the host name is longer than 253 characters"},
+                    BadUrl{"https://" + std::string(2000, 'c') + "/", "the host name is longer than 253 characters",
+                           "https://" + std::string(1016, 'c') + "... (985 more bytes)"}));
 
 INSTANTIATE_TEST_SUITE_P(Addresses, ParseHttpURLRefuses,
                          testing::Values(BadUrl{"https://256.0.0.1/", NO_IPV4}, BadUrl{"https://1.2.3/", NO_IPV4},

@@ -338,24 +338,66 @@ TEST(Verify, RefusesAnEnvelopedTransformOfTheSignatureItself) {
       RefusalOf(text));
 }
 
+TEST(Verify, RefusesASignatureThatRemovesAllThatItCovers) {
+  std::string text = ReadDataFile("tokens/reference-empty-uri.xml");
+  const std::size_t begin = text.find("<ds:Signature ");
+  text = text.substr(begin, text.find("</ds:Signature>") + 15 - begin);
+  const std::string refusal = "The reference URI \"\" covers nothing but the signature, which the enveloped-signature "
+                              "transform removes";
+  EXPECT_EQ(refusal, RefusalOf(text));
+  EXPECT_EQ(refusal, RefusalOf("<?target data?>" + text + "<!-- after -->"));
+  EXPECT_EQ("wrong", RefusalOf("<r>" + text + "</r>"));
+}
+
+/// The genuine token whose canonicalisation names that many prefixes, judged.
+std::string JudgePrefixes(std::size_t count, const std::string &separator) {
+  std::string list;
+  for (std::size_t number = 0; number < count; ++number) {
+    list += separator + "p" + std::to_string(number);
+  }
+  return Refusal(
+      EXCLUSIVE_TRANSFORM,
+      "<ds:Transform Algorithm=\"http://www.w3.org/2001/10/xml-exc-c14n#\"><InclusiveNamespaces PrefixList=\"" + list +
+          "\" xmlns=\"http://www.w3.org/2001/10/xml-exc-c14n#\"/></ds:Transform>");
+}
+
+TEST(Verify, AcceptsAtMost256InclusivePrefixes) {
+  const std::string refusal =
+      "The PrefixList of the algorithm \"http://www.w3.org/2001/10/xml-exc-c14n#\" has more than 256 prefixes";
+  EXPECT_EQ("wrong", JudgePrefixes(256, " ")); // accepted as an algorithm, and not what was signed
+  EXPECT_EQ("wrong", JudgePrefixes(256, "&#9; &#13;&#10;"));
+  EXPECT_EQ(refusal, JudgePrefixes(257, " "));
+  EXPECT_EQ(refusal, JudgePrefixes(1000, "&#10;"));
+}
+
 TEST(Verify, RefusesATreeWithoutCanonicalForm) {
   EXPECT_EQ(0u, Refusal("<saml:Subject>", "<saml:Subject><foo:bar/>").find("No canonical form: "));
 }
 
-TEST(Verify, AnswersFalseForADigestOfAnotherLength) {
-  const std::string text = GoodToken();
-  const std::size_t begin = text.find("<ds:DigestValue>") + 16;
-  const std::string digest = text.substr(begin, text.find('<', begin) - begin);
-  EXPECT_EQ("wrong", Refusal(digest, "AAAA"));
-  EXPECT_EQ("wrong", Refusal(digest, digest.substr(0, digest.size() - 4) + "AAAAAAAA"));
+// The signer signed the changed digest as well: else the signature value would be found wrong, and no digest compared.
+
+/// What becomes of the token whose digest was changed in that way.
+std::string JudgeResigned(const std::string &change) {
+  return RefusalOf(ReadDataFile("attacks/digest-resigned-" + change + ".xml"));
 }
 
-TEST(Verify, ComparesTheDigestByAllItsBytes) {
-  const std::string text = GoodToken();
-  const std::size_t end = text.find("=</ds:DigestValue>");
-  std::string changed = text;
-  changed[end - 2] = changed[end - 2] == 'A' ? 'B' : 'A';
-  EXPECT_EQ("wrong", RefusalOf(changed));
+TEST(Verify, AcceptsAResignedTokenWhoseDigestIsUnchanged) {
+  EXPECT_EQ("accepted", JudgeResigned("unchanged"));
+}
+
+TEST(Verify, AnswersFalseForASignedDigestThatIsTooShort) {
+  EXPECT_EQ("wrong", JudgeResigned("one-octet"));
+  EXPECT_EQ("wrong", JudgeResigned("31-octets"));
+}
+
+TEST(Verify, AnswersFalseForASignedDigestThatIsTooLong) {
+  EXPECT_EQ("wrong", JudgeResigned("one-octet-more"));
+  EXPECT_EQ("wrong", JudgeResigned("32-zeros-more"));
+}
+
+TEST(Verify, AnswersFalseForASignedDigestOfWhichOneBitDiffers) {
+  EXPECT_EQ("wrong", JudgeResigned("first-bit"));
+  EXPECT_EQ("wrong", JudgeResigned("last-bit"));
 }
 
 TEST(Verify, LeavesCommentsOutOfWhatAReferenceCovers) {
@@ -373,6 +415,21 @@ TEST(Verify, TakesOutThisSignatureAndNoOther) {
   const std::size_t begin = text.find("<ds:Signature ");
   const std::string signature = text.substr(begin, text.find("</ds:Signature>") + 15 - begin);
   EXPECT_EQ("wrong", Refusal("</saml:Assertion>", signature + "</saml:Assertion>"));
+}
+
+/// A resolver whose keys cannot be read.
+class BrokenResolver final : public Tarvel::Xml::Security::KeyInfoResolver {
+public:
+  CertificateList Resolve(const Tarvel::Xml::ElementNode *) const override {
+    throw Tarvel::Crypto::CryptoException("the key cannot be read");
+  }
+};
+
+TEST(Verify, RaisesAFailureOfCryptographyAsItsOwnClass) {
+  std::set<std::string> uris;
+  EXPECT_THROWS_MESSAGE(SignatureOf(*ParseDocument(GoodToken()))->Verify(BrokenResolver(), uris), XmlSecurityException,
+                        "the key cannot be read");
+  EXPECT_TRUE(uris.empty());
 }
 
 TEST(Verify, KeepsTheTreeAliveAfterTheDocumentIsGone) {

@@ -2,6 +2,7 @@
 
 #include <tarvel/service/logger.h>
 
+#include <tarvel/core/string_util.h>
 #include <tarvel/service/app.h>
 
 #include <gtest/gtest.h>
@@ -56,6 +57,18 @@ TEST_F(LoggerTest, HandsNameLevelAndFormattedMessageToTheSink) {
   EXPECT_EQ(logger->GetName(), "Name");
   LogInternal(*logger, LEVEL_OPERATION, "opId=%1 END %2", 17, "operation");
   EXPECT_EQ(m_lines, std::vector<std::string>{"Name/64/opId=17 END operation"});
+}
+
+TEST_F(LoggerTest, CutsALineBeyondTheGreatestLength) {
+  Gather();
+  const Ref<Logger> logger = Logger::CreateLogger(m_root, "L", LEVEL_OPERATION);
+  const std::string whole(StringUtil::MAX_LINE_BYTES, 'x');
+  LogInternal(*logger, LEVEL_OPERATION, "%1", whole);
+  LogInternal(*logger, LEVEL_OPERATION, "%1y", whole);
+  LogInternal(*logger, LEVEL_OPERATION, "%1", std::string(16u * 1024 * 1024, 'x'));
+  EXPECT_EQ(m_lines, (std::vector<std::string>{"L/64/" + whole, "L/64/" + whole + "... (1 more bytes)",
+                                               "L/64/" + whole + "... (16770048 more bytes)"}));
+  EXPECT_LT(m_lines.back().size(), 8u * 1024);
 }
 
 TEST_F(LoggerTest, LetsLinesThroughUpToItsLevel) {

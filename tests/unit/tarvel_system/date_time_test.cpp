@@ -232,9 +232,9 @@ TEST(DateTime, RefusesEveryPrefixThatIsNoDateTimeItself) {
   }
 }
 
-TEST(DateTime, RepeatsAtMost64BytesOfARefusedText) {
+TEST(DateTime, RepeatsAtMost1024BytesOfARefusedText) {
   EXPECT_EQ(RefusalOf(std::string(1'000'000, '7')),
-            "\"" + std::string(64, '7') + "...\" is not a date-time: malformed at character 5");
+            "\"" + std::string(1024, '7') + "... (998976 more bytes)\" is not a date-time: malformed at character 5");
 }
 
 TEST(DateTimeToString, IsReadBackToTheMillisecond) {

@@ -154,6 +154,8 @@ TEST(AssertionRefusals, Subject) {
   ExpectRefusals(BearerAssertion(),
                  {
                      {"<saml:Subject>", "<saml:Subject ID=\"\">", "Unexpected attributes on element 'saml:Subject'"},
+                     {"<saml:Subject>", "<saml:Subject xmlns:saml=\"urn:other\">",
+                      "Element 'saml:Subject' has unexpected namespace"},
                      {name, "", NotFound("NameID")},
                      {name, "<saml:BaseID/>", NotFound("NameID")},
                      {name, Twice(name), NotFound("SubjectConfirmation")},
@@ -175,22 +177,25 @@ TEST(AssertionRefusals, SubjectConfirmation) {
   const std::string name = Piece::DELEGATE_NAME;
   const std::string data = Piece::BEARER_DATA;
   const std::string method = " Method=\"urn:oasis:names:tc:SAML:2.0:cm:bearer\"";
-  ExpectRefusals(BearerAssertion(),
-                 {
-                     {method, "", "Node 'saml:SubjectConfirmation is missing required attribute 'Method'"},
-                     {method, method + " Extra=\"\"", "Unexpected attributes on element 'saml:SubjectConfirmation'"},
-                     {method, " Method=\"urn:oasis:names:tc:SAML:2.0:cm:sender-vouches\"",
-                      "Unknown subject confirmation method: 'urn:oasis:names:tc:SAML:2.0:cm:sender-vouches'"},
-                     {method, " Method=\"\"", "Unknown subject confirmation method: ''"},
-                     {method, " Method=\"urn:oasis:names:tc:SAML:2.0:cm:Bearer\"",
-                      "Unknown subject confirmation method: 'urn:oasis:names:tc:SAML:2.0:cm:Bearer'"},
-                     {name, Twice(name), NotFound("SubjectConfirmationData")},
-                     {name + data, data + name, "Unexpected elements after SubjectConfirmationData"},
-                     {data, "", NotFound("SubjectConfirmationData")},
-                     {data, Twice(data), "Unexpected elements after SubjectConfirmationData"},
-                     {"<saml:SubjectConfirmation ", "<saml:SubjectConfirmation xmlns:saml=\"urn:other\" ",
-                      "Element 'saml:SubjectConfirmation' has unexpected namespace"},
-                 });
+  ExpectRefusals(
+      BearerAssertion(),
+      {
+          {method, "", "Node 'saml:SubjectConfirmation is missing required attribute 'Method'"},
+          {method, method + " Extra=\"\"", "Unexpected attributes on element 'saml:SubjectConfirmation'"},
+          {method, " Method=\"urn:oasis:names:tc:SAML:2.0:cm:sender-vouches\"",
+           "Unknown subject confirmation method: 'urn:oasis:names:tc:SAML:2.0:cm:sender-vouches'"},
+          {method, " Method=\"\"", "Unknown subject confirmation method: ''"},
+          {method, " Method=\"urn:oasis:names:tc:SAML:2.0:cm:Bearer\"",
+           "Unknown subject confirmation method: 'urn:oasis:names:tc:SAML:2.0:cm:Bearer'"},
+          {name, Twice(name), NotFound("SubjectConfirmationData")},
+          {"<saml:NameID Format=\"urn:format:delegate\"",
+           "<saml:NameID xmlns:saml=\"urn:other\" Format=\"urn:format:delegate\"", NotFound("SubjectConfirmationData")},
+          {name + data, data + name, "Unexpected elements after SubjectConfirmationData"},
+          {data, "", NotFound("SubjectConfirmationData")},
+          {data, Twice(data), "Unexpected elements after SubjectConfirmationData"},
+          {"<saml:SubjectConfirmation ", "<saml:SubjectConfirmation xmlns:saml=\"urn:other\" ",
+           "Element 'saml:SubjectConfirmation' has unexpected namespace"},
+      });
 }
 
 TEST(AssertionRefusals, BearerData) {
@@ -210,6 +215,8 @@ TEST(AssertionRefusals, BearerData) {
           {date, " NotOnOrAfter=\"soon\"", "saml:SubjectConfirmationData/@NotOnOrAfter is not a date"},
           {data, withContent("<ds:KeyInfo/>"), notEmpty},
           {data, withContent("text"), notEmpty},
+          {"<saml:SubjectConfirmationData", "<saml:SubjectConfirmationData xmlns:saml=\"urn:other\"",
+           "Element 'saml:SubjectConfirmationData' has unexpected namespace"},
       });
 }
 
@@ -243,6 +250,8 @@ TEST(AssertionRefusals, HolderOfKeyData) {
                            {end, "text" + end, "Unexpected elements after SubjectConfirmationData/KeyInfo"},
                            {end, end + "<saml:NameID/>", "Unexpected elements after SubjectConfirmationData"},
                            {"<ds:KeyInfo>", "<saml:Extra/><ds:KeyInfo>", NotFound("KeyInfo")},
+                           {"<saml:SubjectConfirmationData", "<saml:SubjectConfirmationData xmlns:saml=\"urn:other\"",
+                            "Element 'saml:SubjectConfirmationData' has unexpected namespace"},
                        });
 }
 
@@ -317,6 +326,16 @@ TEST(AssertionRefusals, UnknownAndDuplicateRestrictions) {
                      {proxy, "<saml:OneTimeUse/>", UNKNOWN_RESTRICTION + ": saml:OneTimeUse"},
                      {proxy, "<ProxyRestriction/>", UNKNOWN_RESTRICTION + ": ProxyRestriction"},
                      {proxy, "<saml:Condition/>", UNKNOWN_RESTRICTION + ": saml:Condition"},
+                     {"<saml:Condition xsi:type=\"rsa:RenewRestrictionType\"",
+                      "<saml:Condition xmlns:saml=\"urn:other\" xsi:type=\"rsa:RenewRestrictionType\"",
+                      UNKNOWN_RESTRICTION + ": saml:Condition"},
+                     {"<saml:Condition xsi:type=\"del:DelegationRestrictionType\"",
+                      "<saml:Condition xmlns:saml=\"urn:other\" xsi:type=\"del:DelegationRestrictionType\"",
+                      UNKNOWN_RESTRICTION + ": saml:Condition"},
+                     {"<saml:AudienceRestriction>", "<saml:AudienceRestriction xmlns:saml=\"urn:other\">",
+                      UNKNOWN_RESTRICTION + ": saml:AudienceRestriction"},
+                     {"<saml:ProxyRestriction ", "<saml:ProxyRestriction xmlns:saml=\"urn:other\" ",
+                      UNKNOWN_RESTRICTION + ": saml:ProxyRestriction"},
                      {proxy, "<saml:Condition xsi:type=\"rsa:OtherType\"/>", UNKNOWN_RESTRICTION + ": saml:Condition"},
                      {proxy, "text", UNKNOWN_RESTRICTION},
                      {proxy, "<?pi?>", UNKNOWN_RESTRICTION},
@@ -416,6 +435,12 @@ TEST(AssertionRefusals, AuthnStatement) {
           {instant, "", "Node 'saml:AuthnStatement is missing required attribute 'AuthnInstant'"},
           {instant, instant + " SessionIndex=\"\"", "Unexpected attributes on element 'saml:AuthnStatement'"},
           {instant, " AuthnInstant=\"now\"", "saml:AuthnStatement/@AuthnInstant is not a date"},
+          {"<saml:AuthnStatement ", "<saml:AuthnStatement xmlns:saml=\"urn:other\" ",
+           "Element 'saml:AuthnStatement' has unexpected namespace"},
+          {"<saml:AuthnContext>", "<saml:AuthnContext xmlns:saml=\"urn:other\">",
+           "Element 'saml:AuthnContext' has unexpected namespace"},
+          {"<saml:AuthnContextClassRef>", "<saml:AuthnContextClassRef xmlns:saml=\"urn:other\">",
+           "Element 'saml:AuthnContextClassRef' has unexpected namespace"},
           {"<saml:AuthnContext>", "<saml:AuthnContext ID=\"\">",
            "Unexpected attributes on element 'saml:AuthnContext'"},
           {"<saml:AuthnContext>", "<saml:SubjectLocality/><saml:AuthnContext>", NotFound("AuthnContext")},
@@ -445,6 +470,16 @@ TEST(AssertionRefusals, AttributeStatement) {
           {first, "<saml:AttributeValue/>", OnlyText("saml:AttributeValue")},
           {first, "<saml:AttributeValue> \n</saml:AttributeValue>", OnlyText("saml:AttributeValue")},
           {first, "<saml:AttributeValue>a<b/></saml:AttributeValue>", OnlyText("saml:AttributeValue")},
+          {first, "<saml:AttributeValue xmlns:saml=\"urn:other\">first</saml:AttributeValue>",
+           "Element 'saml:AttributeValue' has unexpected namespace"},
+          {first, "<saml:AttributeValue xmlns:x=\"urn:x\" x:more=\"2\">first</saml:AttributeValue>",
+           "Unexpected attribute '{urn:x}more' on element 'saml:AttributeValue'"},
+          {first, "<saml:AttributeValue Extra=\"\">first</saml:AttributeValue>",
+           "Unexpected attribute 'Extra' on element 'saml:AttributeValue'"},
+          {first, "<saml:AttributeValue type=\"xs:string\">first</saml:AttributeValue>",
+           "Unexpected attribute 'type' on element 'saml:AttributeValue'"},
+          {first, "<saml:AttributeValue xsi:type=\"xs:string\" xsi:nil=\"false\">first</saml:AttributeValue>",
+           "Unexpected attribute '{http://www.w3.org/2001/XMLSchema-instance}nil' on element 'saml:AttributeValue'"},
           {first, "<saml:Other>first</saml:Other>", NotFound("AttributeValue")},
           {first, "first", NotFound("AttributeValue")},
       });

@@ -182,6 +182,8 @@ TEST(ParseSamlAssertionElement, TakesRestrictionsInAnyOrder) {
                 conditions.RenewRestriction);
     EXPECT_EQ(2u, conditions.DelegationRestriction->delegates.size());
     EXPECT_EQ(2u, conditions.AudienceRestriction->audiences.size());
+    EXPECT_EQ(3u, conditions.ProxyRestriction->Count.value());
+    EXPECT_EQ(5u, conditions.RenewRestriction->Count.value());
   } while (std::next_permutation(order.begin(), order.end()));
 }
 
@@ -200,9 +202,13 @@ TEST(ParseSamlAssertionElement, KeepsTextsAsTheyStand) {
 }
 
 TEST(ParseSamlAssertionElement, LetsAnAttributeValueSayItsType) {
-  const std::string text = ReplaceOnce(BearerAssertion(), "<saml:AttributeValue>first<",
-                                       "<saml:AttributeValue xsi:type=\"xs:string\">first<");
-  EXPECT_EQ("first", Parse(text).AttributeStatement->attributes[0].values[0]);
+  for (const char *const type :
+       {"xsi:type=\"xs:string\"", "xmlns:i=\"http://www.w3.org/2001/XMLSchema-instance\" i:type=\"\"",
+        "xmlns:xs=\"http://www.w3.org/2001/XMLSchema\" xsi:type=\"xs:string\"", "xmlns:x=\"urn:x\""}) {
+    const std::string text = ReplaceOnce(BearerAssertion(), "<saml:AttributeValue>first<",
+                                         "<saml:AttributeValue " + std::string(type) + ">first<");
+    EXPECT_EQ("first", Parse(text).AttributeStatement->attributes[0].values[0]) << type;
+  }
 }
 
 TEST(ParseSamlAssertionElement, MovesOnToTheNextNode) {

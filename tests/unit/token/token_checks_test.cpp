@@ -249,4 +249,17 @@ TEST_F(CheckTokenPropertiesTest, ReadsTheClockOnce) {
   EXPECT_EQ(looks, 1);
 }
 
+TEST_F(CheckTokenPropertiesTest, ReadsTheClockOnlyAfterVersionIdAndOrderOfTheDates) {
+  int looks = 0;
+  const Tarvel::System::ScopedEnvironment clock({[&looks] { return ++looks; }, {}});
+  SamlAssertionType assertion = ValidBetween(0, 0);
+  EXPECT_THROWS_MESSAGE(Check(assertion), ParseException,
+                        "Unsatisfiable token validity conditions: NotBefore must be less than NotOnOrAfter.");
+  assertion.ID = "";
+  EXPECT_THROWS_MESSAGE(Check(assertion), ParseException, "Invalid token ID");
+  assertion.Version = "";
+  EXPECT_THROWS_MESSAGE(Check(assertion), ParseException, "Invalid token version");
+  EXPECT_EQ(0, looks);
+}
+
 } // namespace

@@ -52,9 +52,14 @@ TEST(ParseTokenSignature, TakesASecondReferenceToTheAssertion) {
   EXPECT_EQ("next", Parse(ReplaceOnce(Piece::SIGNATURE, Reference("#_a1"), Reference("#_other") + Reference(""))));
 }
 
+TEST(ParseTokenSignature, TakesAFirstReferenceToTheAssertion) {
+  EXPECT_EQ("next", Parse(ReplaceOnce(Piece::SIGNATURE, Reference("#_a1"), Reference("#_a1") + Reference("#_other"))));
+  EXPECT_EQ("next", Parse(ReplaceOnce(Piece::SIGNATURE, Reference("#_a1"), Reference("") + Reference("#_other"))));
+}
+
 TEST(ParseTokenSignature, RefusesReferencesToOtherElements) {
-  for (const std::string uri : {"#_other", "_a1", "#", "#_A1", "#_a1 ", " #_a1", "#_a", "#_a11", "##_a1",
-                                "#xpointer(id('_a1'))", "#xpointer(/)", "http://corp.example/#_a1"}) {
+  for (const std::string uri : {"#_other", "_a1", "#", "#_A1", "#_a1 ", " #_a1", "#_a", "#_a11", "##_a1", "x_a1",
+                                "/_a1", " _a1", "#xpointer(id('_a1'))", "#xpointer(/)", "http://corp.example/#_a1"}) {
     EXPECT_THROWS_MESSAGE(Parse(WithUri(uri)), ParseException, "Token's signature must cover the entire token");
   }
 }

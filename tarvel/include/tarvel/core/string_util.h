@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// Letter case, Base64 and UUID texts.
+/// Letter case, lengths fit for a message, Base64 and UUID texts.
 
 #pragma once
 
@@ -26,6 +26,16 @@ public:
 
   /// The lower-case form, likewise.
   static std::string ToLower(std::string_view text);
+
+  /// How much of a value a message holds, in bytes.
+  static constexpr std::size_t MAX_VALUE_BYTES = 1024;
+
+  /// How long a line of a log or on a terminal may be, in bytes.
+  static constexpr std::size_t MAX_LINE_BYTES = 7 * 1024;
+
+  /// `text` as a message may show it: whole when it has at most `most` bytes. Of a longer one that many bytes, or up to
+  /// three fewer so as not to part a UTF-8 character, then "... (N more bytes)".
+  static std::string Shorten(std::string_view text, std::size_t most = MAX_VALUE_BYTES);
 
   /// A new random UUID (RFC 4122, version 4) as 36 lower-case characters, from the system's random source, or from the
   /// source that `System::ScopedEnvironment` put in its place.

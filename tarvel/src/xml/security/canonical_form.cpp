@@ -6,6 +6,7 @@
 #include "xml/security/element_place.h"
 #include "xml/security/namespace_bindings.h"
 
+#include <tarvel/core/string_util.h>
 #include <tarvel/xml/security/canonicalizer.h>
 #include <tarvel/xml/security/exceptions.h>
 
@@ -52,16 +53,17 @@ std::string_view DeclaredPrefix(const Attribute &declaration) {
 
 void RequireDeclarable(std::string_view prefix, std::string_view uri, const ElementNode &element) {
   if (uri.empty() && !prefix.empty()) {
-    Refuse("the prefix \"" + std::string(prefix) + "\" is bound to no namespace", element);
+    Refuse("the prefix \"" + StringUtil::Shorten(prefix) + "\" is bound to no namespace", element);
   }
   if (!uri.empty() && !HasScheme(uri)) {
-    Refuse("the namespace name \"" + std::string(uri.substr(0, MAX_NAMESPACE_NAME_BYTES)) + "\" is relative", element);
+    Refuse("the namespace name \"" + StringUtil::Shorten(uri) + "\" is relative", element);
   }
   if (uri.size() > MAX_NAMESPACE_NAME_BYTES) {
     Refuse("a namespace name is longer than " + std::to_string(MAX_NAMESPACE_NAME_BYTES) + " bytes", element);
   }
   if (prefix == "xmlns" || (prefix == "xml") != (uri == XML_NAMESPACE)) {
-    Refuse("the prefix \"" + std::string(prefix) + "\" is bound to \"" + std::string(uri) + "\"", element);
+    Refuse("the prefix \"" + StringUtil::Shorten(prefix) + "\" is bound to \"" + StringUtil::Shorten(uri) + "\"",
+           element);
   }
 }
 
@@ -286,7 +288,7 @@ void CanonicalWalk::WriteAttributes(const ElementNode &element) {
   for (const CanonicalAttribute &attribute : m_attributes) {
     if (previous && attribute.HasNameOf(*previous)) {
       if (attribute.height == 0) {
-        Refuse("the attribute \"" + std::string(attribute.attribute->GetName()) + "\" stands twice", element);
+        Refuse("the attribute \"" + StringUtil::Shorten(attribute.attribute->GetName()) + "\" stands twice", element);
       }
       continue; // a nearer one overrides it
     }
@@ -333,7 +335,7 @@ void CanonicalWalk::WriteOutsideDocumentElement(const Node &node, bool before) {
 std::size_t CanonicalWalk::FindPrefix(std::string_view prefix, const ElementNode &element) const {
   const std::size_t binding = m_bindings.Find(prefix);
   if (binding == NamespaceBindings::NOT_BOUND) {
-    Refuse("the prefix \"" + std::string(prefix) + "\" is not bound", element);
+    Refuse("the prefix \"" + StringUtil::Shorten(prefix) + "\" is not bound", element);
   }
   return binding;
 }

@@ -4,6 +4,7 @@
 
 #include "xml/security/canonical_form.h"
 
+#include <tarvel/core/string_util.h>
 #include <tarvel/xml/security/exceptions.h>
 
 #include <utility>
@@ -34,10 +35,11 @@ Ref<Canonicalizer> CreateCanonicalizer(std::string_view algorithmUri,
                                        const std::vector<std::string> &inclusivePrefixes) {
   CanonicalMethod method;
   if (!FindCanonicalMethod(algorithmUri, method)) {
-    throw XmlSecurityException("The canonicalization algorithm \"" + std::string(algorithmUri) + "\" is not accepted");
+    throw XmlSecurityException("The canonicalization algorithm \"" + StringUtil::Shorten(algorithmUri) +
+                               "\" is not accepted");
   }
   if (!method.isExclusive && !inclusivePrefixes.empty()) {
-    throw XmlSecurityException("The canonicalization algorithm \"" + std::string(algorithmUri) +
+    throw XmlSecurityException("The canonicalization algorithm \"" + StringUtil::Shorten(algorithmUri) +
                                "\" takes no list of inclusive namespaces");
   }
   SetInclusivePrefixes(method, inclusivePrefixes);

@@ -2,6 +2,7 @@
 
 #include "xml/security/reference_target.h"
 
+#include <tarvel/core/string_util.h>
 #include <tarvel/xml/security/exceptions.h>
 
 #include <algorithm>
@@ -15,7 +16,7 @@ constexpr std::string_view WSU_NAMESPACE =
     "http://docs.oasis-open.org/wss/2004/01/oasis-200401-wss-wssecurity-utility-1.0.xsd";
 
 [[noreturn]] void Refuse(std::string_view uri, const char *why) {
-  throw XmlSecurityException("The reference URI \"" + std::string(uri) + "\" is not accepted: " + why);
+  throw XmlSecurityException("The reference URI \"" + StringUtil::Shorten(uri) + "\" is not accepted: " + why);
 }
 
 /// The identifier behind the "#", which must be a bare name.
@@ -81,15 +82,6 @@ void NoteMatches(const ElementNode &element, const std::vector<std::string_view>
   }
 }
 
-void RequireFound(const IdentifierSearch &search, std::string_view uri, const ElementNode &root) {
-  if (!search.target) {
-    Refuse(uri, "no element has that identifier");
-  }
-  if (HasIdentifier(root, search.identifier) && search.target != &root) {
-    Refuse(uri, "it means another element than the one that the signature is to cover");
-  }
-}
-
 } // namespace
 
 std::vector<IdentifierSearch> PlanSearches(const std::vector<std::string_view> &uris) {
@@ -114,7 +106,9 @@ std::vector<const Node *> ResolveReferences(const ElementNode &root, const std::
   }
   std::vector<const Node *> targets(uris.size(), top);
   for (const IdentifierSearch &search : searches) {
-    RequireFound(search, uris[search.reference], root);
+    if (!search.target) {
+      Refuse(uris[search.reference], "no element has that identifier");
+    }
     targets[search.reference] = search.target;
   }
   for (std::size_t index = 0; index < uris.size(); ++index) {

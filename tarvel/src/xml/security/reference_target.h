@@ -25,7 +25,7 @@ std::vector<IdentifierSearch> PlanSearches(const std::vector<std::string_view> &
 
 /// The targets of `uris`, in their order, in the tree that holds `root`: "" is the document (or topmost element), "#x" the
 /// one element with an identifier x in an attribute ID, Id, wsu:Id or xml:id. The tree is walked once, for all of them.
-/// When `root` has the identifier itself, it must be what is found.
+/// An identifier that `root` itself has can therefore mean nothing but `root`.
 /// @throws XmlSecurityException when an URI is of another kind, or not exactly one element has the identifier.
 std::vector<const Node *> ResolveReferences(const ElementNode &root, const std::vector<std::string_view> &uris);
 

@@ -21,7 +21,7 @@ namespace {
 
 void RequireExclusive(std::string_view canonicalizationUri) {
   if (canonicalizationUri != CanonicalizationUri::EXCLUSIVE) {
-    throw XmlSecurityException("The canonicalization algorithm \"" + std::string(canonicalizationUri) +
+    throw XmlSecurityException("The canonicalization algorithm \"" + StringUtil::Shorten(canonicalizationUri) +
                                "\" is not signed with");
   }
 }
@@ -29,7 +29,7 @@ void RequireExclusive(std::string_view canonicalizationUri) {
 SignatureAlgorithm RequireSigningAlgorithm(std::string_view uri) {
   const std::optional<SignatureAlgorithm> algorithm = FindSignatureAlgorithm(uri);
   if (!algorithm || algorithm->scheme != Crypto::SignatureScheme::RSA_PKCS1) {
-    throw XmlSecurityException("The signature algorithm \"" + std::string(uri) + "\" is not signed with");
+    throw XmlSecurityException("The signature algorithm \"" + StringUtil::Shorten(uri) + "\" is not signed with");
   }
   return *algorithm;
 }
@@ -84,7 +84,7 @@ void BlankSignature::AddReference(std::string_view uri, std::string_view digestU
   RequireExclusive(transformUri);
   const std::optional<Crypto::DigestAlgorithm> digest = FindDigestAlgorithm(digestUri);
   if (!digest) {
-    throw XmlSecurityException("The digest algorithm \"" + std::string(digestUri) + "\" is not signed with");
+    throw XmlSecurityException("The digest algorithm \"" + StringUtil::Shorten(digestUri) + "\" is not signed with");
   }
   m_digestMethods.push_back({std::string(digestUri), *digest});
   m_references.push_back({std::string(uri)});

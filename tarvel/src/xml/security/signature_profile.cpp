@@ -2,10 +2,12 @@
 
 #include "xml/security/signature_profile.h"
 
+#include <tarvel/core/string_util.h>
 #include <tarvel/xml/security/canonicalizer.h>
 #include <tarvel/xml/security/exceptions.h>
 #include <tarvel/xml/security/signature.h>
 
+#include <algorithm>
 #include <string>
 #include <utility>
 
@@ -18,6 +20,9 @@ using Crypto::SignatureScheme;
 
 constexpr std::size_t MAX_REFERENCES = 10;
 constexpr std::size_t MAX_TRANSFORMS = 2; // of one reference
+constexpr std::size_t MAX_INCLUSIVE_PREFIXES = 256;
+
+constexpr std::string_view WHITE_SPACE = " \t\r\n";
 
 struct NamedSignatureAlgorithm {
   std::string_view uri;
@@ -48,21 +53,37 @@ constexpr NamedDigestAlgorithm DIGEST_ALGORITHMS[] = {
 };
 
 [[noreturn]] void RefuseAlgorithm(const char *kind, std::string_view uri) {
-  throw XmlSecurityException(std::string("The ") + kind + " algorithm \"" + std::string(uri) + "\" is not accepted");
+  throw XmlSecurityException(std::string("The ") + kind + " algorithm \"" + StringUtil::Shorten(uri) +
+                             "\" is not accepted");
 }
 
 [[noreturn]] void RefuseParameter(std::string_view parameter, std::string_view uri) {
-  throw XmlSecurityException("The parameter \"" + std::string(parameter) + "\" of the algorithm \"" + std::string(uri) +
-                             "\" is not accepted");
+  throw XmlSecurityException("The parameter \"" + StringUtil::Shorten(parameter) + "\" of the algorithm \"" +
+                             StringUtil::Shorten(uri) + "\" is not accepted");
 }
 
 void RequireNoParameters(const AlgorithmSyntax &syntax) {
   if (!syntax.otherParameter.empty()) {
     RefuseParameter(syntax.otherParameter, syntax.uri);
   }
-  if (syntax.inclusivePrefixes) {
+  if (syntax.prefixList) {
     RefuseParameter("InclusiveNamespaces", syntax.uri);
   }
+}
+
+/// The prefixes of a list that blanks keep apart. Counted while it is read: a list of millions needs no memory.
+std::vector<std::string> RequirePrefixes(std::string_view list, std::string_view uri) {
+  std::vector<std::string> prefixes;
+  for (std::size_t begin = list.find_first_not_of(WHITE_SPACE); begin != std::string_view::npos;) {
+    if (prefixes.size() == MAX_INCLUSIVE_PREFIXES) {
+      throw XmlSecurityException("The PrefixList of the algorithm \"" + StringUtil::Shorten(uri) + "\" has more than " +
+                                 std::to_string(MAX_INCLUSIVE_PREFIXES) + " prefixes");
+    }
+    const std::size_t end = std::min(list.find_first_of(WHITE_SPACE, begin), list.size());
+    prefixes.emplace_back(list.substr(begin, end - begin));
+    begin = list.find_first_not_of(WHITE_SPACE, end);
+  }
+  return prefixes;
 }
 
 CanonicalMethod RequireCanonicalMethod(const char *kind, const AlgorithmSyntax &syntax) {
@@ -73,8 +94,8 @@ CanonicalMethod RequireCanonicalMethod(const char *kind, const AlgorithmSyntax &
   if (!method.isExclusive || !syntax.otherParameter.empty()) {
     RequireNoParameters(syntax);
   }
-  if (syntax.inclusivePrefixes) {
-    SetInclusivePrefixes(method, *syntax.inclusivePrefixes);
+  if (syntax.prefixList) {
+    SetInclusivePrefixes(method, RequirePrefixes(*syntax.prefixList, syntax.uri));
   }
   return method;
 }
@@ -108,8 +129,8 @@ void PlanTransforms(const std::vector<AlgorithmSyntax> &transforms, ReferencePla
   for (const AlgorithmSyntax &transform : transforms) {
     const bool isEnveloped = transform.uri == SignatureUri::ENVELOPED_SIGNATURE;
     if (isCanonical || (isEnveloped && plan.omitsSignature)) {
-      throw XmlSecurityException("The transform \"" + std::string(transform.uri) + "\" is not accepted after \"" +
-                                 std::string(transforms.front().uri) + "\"");
+      throw XmlSecurityException("The transform \"" + StringUtil::Shorten(transform.uri) +
+                                 "\" is not accepted after \"" + StringUtil::Shorten(transforms.front().uri) + "\"");
     }
     if (isEnveloped) {
       RequireNoParameters(transform);
@@ -123,7 +144,7 @@ void PlanTransforms(const std::vector<AlgorithmSyntax> &transforms, ReferencePla
 
 ReferencePlan PlanReference(const ReferenceSyntax &syntax) {
   if (syntax.type) {
-    throw XmlSecurityException("A reference of the type \"" + std::string(*syntax.type) + "\" is not accepted");
+    throw XmlSecurityException("A reference of the type \"" + StringUtil::Shorten(*syntax.type) + "\" is not accepted");
   }
   ReferencePlan plan;
   PlanTransforms(syntax.transforms, plan);

@@ -23,7 +23,7 @@ constexpr std::string_view WHITE_SPACE = " \t\r\n";
 }
 
 std::string Quote(std::string_view name) {
-  return "\"" + std::string(name) + "\"";
+  return "\"" + StringUtil::Shorten(name) + "\"";
 }
 
 bool IsSignatureElement(const ElementNode &element, std::string_view localName) {
@@ -114,22 +114,12 @@ std::vector<std::uint8_t> ReadBase64(const ElementNode &element) {
   }
 }
 
-std::vector<std::string> SplitAtWhiteSpace(std::string_view text) {
-  std::vector<std::string> words;
-  for (std::size_t begin = text.find_first_not_of(WHITE_SPACE); begin != std::string_view::npos;) {
-    const std::size_t end = std::min(text.find_first_of(WHITE_SPACE, begin), text.size());
-    words.emplace_back(text.substr(begin, end - begin));
-    begin = text.find_first_not_of(WHITE_SPACE, end);
-  }
-  return words;
-}
-
-std::vector<std::string> ReadInclusivePrefixes(const ElementNode &element) {
+std::string_view ReadPrefixList(const ElementNode &element) {
   RequireAttributesAmong(element, {"PrefixList"});
   if (element.GetFirstChild()) {
     Fail("The element " + Quote(element.GetName()) + " must be empty", element);
   }
-  return SplitAtWhiteSpace(RequireAttribute(element, "PrefixList"));
+  return RequireAttribute(element, "PrefixList");
 }
 
 AlgorithmSyntax ReadAlgorithm(const ElementNode &element) {
@@ -139,8 +129,8 @@ AlgorithmSyntax ReadAlgorithm(const ElementNode &element) {
   for (ChildElements children(element); children.Current(); children.MoveOn()) {
     const ElementNode &child = *children.Current();
     // The namespace of the parameter is the algorithm's URI.
-    if (!algorithm.inclusivePrefixes && child.HasQName(CanonicalizationUri::EXCLUSIVE, "InclusiveNamespaces")) {
-      algorithm.inclusivePrefixes = ReadInclusivePrefixes(child);
+    if (!algorithm.prefixList && child.HasQName(CanonicalizationUri::EXCLUSIVE, "InclusiveNamespaces")) {
+      algorithm.prefixList = ReadPrefixList(child);
     } else if (algorithm.otherParameter.empty()) {
       algorithm.otherParameter = child.GetName();
     }

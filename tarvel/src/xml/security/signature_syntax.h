@@ -18,7 +18,7 @@ namespace Tarvel::Xml::Security {
 /// the tree.
 struct AlgorithmSyntax {
   std::string_view uri;
-  std::optional<std::vector<std::string>> inclusivePrefixes; ///< of an ec:InclusiveNamespaces
+  std::optional<std::string_view> prefixList; ///< of an ec:InclusiveNamespaces, as written
   std::string_view otherParameter; ///< name of the first child element that is none; empty when there is none such
 };
 

@@ -8,6 +8,7 @@
 #include "xml/security/signature_syntax.h"
 
 #include <tarvel/core/exception.h>
+#include <tarvel/core/string_util.h>
 #include <tarvel/xml/security/signature.h>
 
 #include <openssl/crypto.h>
@@ -122,7 +123,7 @@ Crypto::CertificateList ParsedSignature::UsableKeys(const KeyInfoResolver &resol
   }
   if (usable.empty()) {
     throw XmlSecurityException("No trusted key can be used with the signature algorithm \"" +
-                               std::string(m_syntax.signatureMethod.uri) + "\"");
+                               StringUtil::Shorten(m_syntax.signatureMethod.uri) + "\"");
   }
   return usable;
 }
@@ -140,8 +141,13 @@ void ParsedSignature::RequireEnveloping(const Node &target, const ReferencePlan 
                                         const ReferenceSyntax &reference) const {
   const Node *const signature = m_element.get();
   if (plan.omitsSignature && (signature == &target || !IsWithin(signature, target))) {
-    throw XmlSecurityException("The reference URI \"" + std::string(reference.uri) +
+    throw XmlSecurityException("The reference URI \"" + StringUtil::Shorten(reference.uri) +
                                "\" has the enveloped-signature transform, but does not envelop the signature");
+  }
+  // Without its document element a document has nothing that could be signed, and the digest of nothing fits every such.
+  if (plan.omitsSignature && target.GetKind() == NodeKind::DOCUMENT && signature->GetParent() == &target) {
+    throw XmlSecurityException("The reference URI \"" + StringUtil::Shorten(reference.uri) +
+                               "\" covers nothing but the signature, which the enveloped-signature transform removes");
   }
 }
 

@@ -1,0 +1,126 @@
+// SPDX-License-Identifier: Apache-2.0
+// Canonical forms that fill the canonicaliser's buffer and its table of namespaces, and the escapes that other engines leave
+// out. What is expected is written here, by no engine at all.
+
+#include "documents.h"
+
+#include <tarvel/xml/security/canonicalizer.h>
+
+#include <gtest/gtest.h>
+
+#include <string>
+
+namespace {
+
+namespace Uri = Tarvel::Xml::Security::CanonicalizationUri;
+using Testing::CanonicalDocument;
+using Testing::CanonicalForm;
+
+constexpr std::size_t BUFFER_BYTES = 4096; // of the canonicaliser's output
+
+/// Has each kind of piece that is written: tags, attributes, escapes, one character, a processing instruction, a comment.
+const std::string PIECES =
+    R"(<a xmlns="urn:a" xmlns:p="urn:p?a&amp;b" b="&quot;&#xA;" p:c="d">&lt;e&gt;f<?g h?><!--i--><p:j></p:j></a>k)";
+
+// Each document is canonical: no matter where the buffer is full, the form is the document itself.
+TEST(CanonicalizeBoundaries, EachPieceMayMeetTheEndOfTheBuffer) {
+  for (const std::size_t buffers : {std::size_t{1}, std::size_t{2}}) {
+    for (std::size_t before = buffers * BUFFER_BYTES - PIECES.size() - 4; before <= buffers * BUFFER_BYTES + 1;
+         ++before) {
+      const std::string text = "<r>" + std::string(before - 3, 'x') + PIECES + "</r>";
+      ASSERT_TRUE(text == CanonicalDocument(text, Uri::INCLUSIVE_WITH_COMMENTS)) << before;
+    }
+  }
+}
+
+// The buffer starts anew with each text that is as long as it is, or longer.
+TEST(CanonicalizeBoundaries, ATextMayBeAsLongAsTheBuffer) {
+  for (std::size_t before = 0; before <= 2; ++before) {
+    for (std::size_t length = BUFFER_BYTES - 8; length <= BUFFER_BYTES + 8; ++length) {
+      const std::string text = "<r>" + std::string(before, 'x') + "<a></a>" + std::string(length, 'y') + "<a></a></r>";
+      ASSERT_TRUE(text == CanonicalDocument(text, Uri::EXCLUSIVE)) << before << " " << length;
+    }
+  }
+}
+
+TEST(CanonicalizeBoundaries, OneCharacterAtATimeFillsTheBuffer) {
+  std::string text = "<r>";
+  for (std::size_t count = 0; count < 2 * BUFFER_BYTES; ++count) {
+    text += count % 2 == 0 ? "&amp;" : "x";
+  }
+  text += "</r>";
+  EXPECT_TRUE(text == CanonicalDocument(text, Uri::INCLUSIVE));
+}
+
+/// "p" and a number of three digits, so that the prefixes are in order.
+std::string Prefix(std::size_t number) {
+  const std::string digits = std::to_string(number);
+  return "p" + std::string(3 - digits.size(), '0') + digits;
+}
+
+constexpr std::size_t MANY_PREFIXES = 200; // more than the table has buckets: some collide
+
+TEST(CanonicalizeBoundaries, FindsEachOfManyPrefixesInScope) {
+  std::string declarations;
+  std::string uses;
+  std::string expected;
+  for (std::size_t number = 0; number < MANY_PREFIXES; ++number) {
+    const std::string declaration = " xmlns:" + Prefix(number) + "=\"urn:" + std::to_string(number) + "\"";
+    declarations = declaration + declarations;
+    uses += "<" + Prefix(number) + ":a></" + Prefix(number) + ":a>";
+    expected += "<" + Prefix(number) + ":a" + declaration + "></" + Prefix(number) + ":a>";
+  }
+  EXPECT_EQ("<r>" + expected + "</r>", CanonicalDocument("<r" + declarations + ">" + uses + "</r>", Uri::EXCLUSIVE));
+}
+
+TEST(CanonicalizeBoundaries, SortsManyPrefixesThatOneElementDeclares) {
+  std::string reversed;
+  std::string sorted;
+  for (std::size_t number = 0; number < MANY_PREFIXES; ++number) {
+    const std::string declaration = " xmlns:" + Prefix(number) + "=\"urn:" + std::to_string(number) + "\"";
+    reversed = declaration + reversed;
+    sorted += declaration;
+  }
+  EXPECT_EQ("<r" + sorted + "></r>", CanonicalDocument("<r" + reversed + "/>", Uri::INCLUSIVE));
+}
+
+TEST(CanonicalizeBoundaries, ForgetsPrefixesOfAnElementThatHasEnded) {
+  std::string inner;
+  std::string innerCanonical;
+  for (std::size_t number = 0; number < MANY_PREFIXES; ++number) {
+    const std::string name = Prefix(number);
+    inner += "<" + name + ":a xmlns:" + name + "=\"urn:inner\"/><" + name + ":a/>";
+    innerCanonical += "<" + name + ":a xmlns:" + name + "=\"urn:inner\"></" + name + ":a><" + name +
+                      ":a xmlns:" + name + "=\"urn:outer\"></" + name + ":a>";
+  }
+  std::string declarations;
+  for (std::size_t number = 0; number < MANY_PREFIXES; ++number) {
+    declarations += " xmlns:" + Prefix(number) + "=\"urn:outer\"";
+  }
+  EXPECT_EQ("<r>" + innerCanonical + "</r>",
+            CanonicalDocument("<r" + declarations + ">" + inner + "</r>", Uri::EXCLUSIVE));
+}
+
+// Canonical XML 1.0, section 2.3: a namespace node is written as an attribute is.
+TEST(CanonicalizeBoundaries, EscapesANamespaceNameAsAnAttributeValue) {
+  const std::string canonical = "<p:r xmlns=\"urn:a?b&amp;c='\" xmlns:p=\"urn:p?x&amp;y\"><s></s></p:r>";
+  EXPECT_EQ(canonical, CanonicalDocument(canonical, Uri::INCLUSIVE));
+  EXPECT_EQ("<p:r xmlns:p=\"urn:p?x&amp;y\"><s xmlns=\"urn:a?b&amp;c='\"></s></p:r>",
+            CanonicalDocument(canonical, Uri::EXCLUSIVE));
+}
+
+// A parser may refuse such a name; a tree that was not parsed may have it.
+TEST(CanonicalizeBoundaries, EscapesEachCharacterOfANamespaceNameThatHasAnEscape) {
+  Tarvel::Ref<Tarvel::Xml::ElementNode> element;
+  Tarvel::Xml::CreateElementNode("p", "r", element);
+  element->DefineAttribute("xmlns:p", "urn:&<>\"'\t\n\r");
+  EXPECT_EQ("<p:r xmlns:p=\"urn:&amp;&lt;>&quot;'&#x9;&#xA;&#xD;\"></p:r>", CanonicalForm(*element, Uri::INCLUSIVE));
+  EXPECT_EQ("<p:r xmlns:p=\"urn:&amp;&lt;>&quot;'&#x9;&#xA;&#xD;\"></p:r>", CanonicalForm(*element, Uri::EXCLUSIVE));
+}
+
+TEST(CanonicalizeBoundaries, KeepsDataOfOneCharacterInAProcessingInstruction) {
+  EXPECT_EQ("<?a b?>\n<r><?c d?><?e f g?><?h?></r>\n<?i j?>",
+            CanonicalDocument("<?a b?><r><?c   d?><?e f g?><?h ?></r><?i\nj?>", Uri::INCLUSIVE));
+}
+
+} // namespace
