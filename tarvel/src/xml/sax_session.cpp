@@ -7,10 +7,10 @@
 #include <libxml/xmlerror.h>
 
 #include <algorithm>
+#include <cerrno>
 #include <cstring>
 #include <functional>
 #include <mutex>
-#include <new>
 
 namespace Tarvel {
 namespace Xml {
@@ -169,7 +169,7 @@ struct SaxSession::Callbacks {
 struct SaxSession::Context {
   explicit Context(SaxSession &session) : parser(xmlNewParserCtxt()) {
     if (!parser) {
-      throw std::bad_alloc();
+      throw OutOfMemoryException();
     }
     session.m_parser = parser;
     *parser->sax = Callbacks::GetTable();
@@ -181,7 +181,7 @@ struct SaxSession::Context {
     if (!input || inputPush(parser, input) < 0) {
       xmlFreeInputStream(input);
       xmlFreeParserCtxt(parser);
-      throw std::bad_alloc();
+      throw OutOfMemoryException();
     }
   }
   Context(const Context &) = delete;
@@ -197,12 +197,14 @@ SaxSession::SaxSession(std::string_view source, XMLHandler &handler)
 void SaxSession::Run() {
   static std::once_flag initialised;
   std::call_once(initialised, [] { xmlInitParser(); });
+  errno = 0;
   const LastErrorKeeper lastError;
   const Context context(*this);
   xmlParseDocument(context.parser);
   if (m_failure) {
     std::rethrow_exception(m_failure);
   }
+  RequireMemory(context.parser->errNo);
   if (!context.parser->wellFormed) { // without having said why
     throw XMLParseException("the document is not well-formed", 1, 1);
   }
@@ -278,8 +280,17 @@ void SaxSession::ReadStartTag(std::size_t begin, std::size_t end, const xmlChar 
   }
 }
 
+// Where libxml2 lacks memory it may report something else, such as a namespace name that is no URI, or nothing at all. But then
+// `malloc` has set errno, which `Run` has reset and nothing in the parser changes.
+void SaxSession::RequireMemory(int errorCode) {
+  if (errorCode == XML_ERR_NO_MEMORY || errno == ENOMEM) {
+    throw OutOfMemoryException();
+  }
+}
+
 void SaxSession::TakeError(const xmlError &error) {
   if (error.level < XML_ERR_ERROR) {
+    RequireMemory(error.code);
     return;
   }
   if (error.code == XML_NS_ERR_UNDEFINED_NAMESPACE) {
@@ -289,9 +300,7 @@ void SaxSession::TakeError(const xmlError &error) {
     }
     return;
   }
-  if (error.code == XML_ERR_NO_MEMORY) {
-    throw std::bad_alloc();
-  }
+  RequireMemory(error.code);
   Refuse(GetDetail(error), GetOffset());
 }
 
