@@ -34,7 +34,9 @@ constexpr const char *NO_VERSION = "Cannot require TLS 1.2";
 constexpr const char *NO_CIPHERS = "Cannot choose cipher suites";
 
 constexpr std::uint64_t OPTIONS = SSL_OP_NO_RENEGOTIATION | SSL_OP_NO_COMPRESSION | SSL_OP_CLEANSE_PLAINTEXT;
-constexpr std::uint64_t UNSAFE_OPTIONS = SSL_OP_ALLOW_UNSAFE_LEGACY_RENEGOTIATION | SSL_OP_LEGACY_SERVER_CONNECT;
+constexpr std::uint64_t UNSAFE_OPTIONS = SSL_OP_ALLOW_UNSAFE_LEGACY_RENEGOTIATION | SSL_OP_LEGACY_SERVER_CONNECT |
+                                         SSL_OP_IGNORE_UNEXPECTED_EOF | SSL_OP_ALLOW_NO_DHE_KEX |
+                                         SSL_OP_NO_EXTENDED_MASTER_SECRET | SSL_OP_NO_ENCRYPT_THEN_MAC;
 
 void Require(bool isSet, const Crypto::OpenSslErrorScope &errors, const char *failure) {
   if (!isSet) {

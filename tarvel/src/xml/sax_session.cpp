@@ -60,10 +60,12 @@ std::string GetDetail(const xmlError &error) {
   return detail;
 }
 
-/// Gives a host that uses libxml2 itself its thread's last error back, which each of our errors would replace.
+/// Gives a host that uses libxml2 itself its thread's last error back, which each of our errors would replace. Meanwhile
+/// nothing is written to standard error, as errors are that belong to no parser.
 class LastErrorKeeper {
 public:
-  LastErrorKeeper() {
+  LastErrorKeeper() : m_handler(xmlStructuredError), m_context(xmlStructuredErrorContext) {
+    xmlSetStructuredErrorFunc(nullptr, [](void *, xmlErrorPtr) {});
     if (const xmlError *const last = xmlGetLastError()) {
       xmlCopyError(const_cast<xmlError *>(last), &m_kept);
     }
@@ -72,6 +74,7 @@ public:
   LastErrorKeeper &operator=(const LastErrorKeeper &) = delete;
 
   ~LastErrorKeeper() {
+    xmlSetStructuredErrorFunc(m_context, m_handler);
     xmlResetLastError();
     if (m_kept.code != XML_ERR_OK) {
       xmlCopyError(&m_kept, &xmlLastError);
@@ -80,6 +83,8 @@ public:
   }
 
 private:
+  const xmlStructuredErrorFunc m_handler;
+  void *const m_context;
   xmlError m_kept{};
 };
 

@@ -243,10 +243,12 @@ TEST_F(OutOfMemory, IsReportedByHandshakesReadsAndWrites) {
 
 TEST_F(OutOfMemory, IsReportedByTheParser) {
   const std::string xml = Token("full");
+  testing::internal::CaptureStderr();
   ExpectNothingElse([&xml] {
     const Ref<Tarvel::Reader> reader = Tarvel::CreateStringReader(xml);
     Tarvel::Xml::CreateXMLParser(Tarvel::Xml::CreateXMLDocumentHandler())->Parse(*reader);
   });
+  EXPECT_EQ(testing::internal::GetCapturedStderr(), "");
 }
 
 } // namespace
