@@ -141,9 +141,9 @@ TEST_F(OutOfMemory, IsReportedByPrivateKeys) {
   for (const auto &[name, step] : std::map<std::string, int>{{"p256.key", 1},
                                                              {"p256.key.der", 1},
                                                              {"rsa2048-traditional.key", 1},
-                                                             {"p256-traditional-encrypted.key", 1},
-                                                             {"p256-encrypted.key", 13},
-                                                             {"p256-encrypted.key.der", 17}}) {
+                                                             {"p256-traditional-encrypted.key", 3},
+                                                             {"p256-encrypted.key", 41},
+                                                             {"p256-encrypted.key.der", 43}}) {
     SCOPED_TRACE(name);
     const std::string path = DataPath("crypto/" + name);
     ExpectNothingElse([path, answer] { Tarvel::Crypto::LoadPrivateKey(path, answer); }, "done", step);

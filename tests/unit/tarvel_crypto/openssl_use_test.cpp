@@ -3,6 +3,7 @@
 
 #include "crypto/openssl_use.h"
 
+#include "crypto/passphrase.h"
 #include "crypto/public_key.h"
 #include "fixtures.h"
 #include "support/process_resources.h"
@@ -108,6 +109,27 @@ void UseAfterCleanUp() {
   ReportRefusal("system configuration", [] { UseSystemConfiguration(); });
   work.reset(); // nothing is freed
   std::_Exit(0);
+}
+
+TEST(Passphrase, IsAskedForInAPauseOfTheUse) {
+  OpenSslUse::Prepare();
+  OpenSslUse use;
+  const PassphraseCallback ask = [&use] {
+    EXPECT_FALSE(use); // so that nobody waits for who types
+    return std::string("x");
+  };
+  Passphrase passphrase(ask, use);
+  EXPECT_EQ(passphrase.Get(), "x");
+  EXPECT_TRUE(use);
+}
+
+TEST(Passphrase, IsFollowedByTheUseAlsoWhenTheHostThrows) {
+  OpenSslUse::Prepare();
+  OpenSslUse use;
+  const PassphraseCallback ask = []() -> std::string { throw InvalidArgumentException("no"); };
+  Passphrase passphrase(ask, use);
+  EXPECT_THROW(passphrase.Get(), InvalidArgumentException);
+  EXPECT_TRUE(use);
 }
 
 void CleanUpWhileThePassphraseIsAskedFor() {

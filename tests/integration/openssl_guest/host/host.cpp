@@ -30,8 +30,8 @@ using Tarvel::Ref;
 using Testing::DataPath;
 using Testing::ReadDataFile;
 
-// Whatever waits for ever ends the process by a signal.
-constexpr unsigned PATIENCE_SECONDS = 50;
+// What waits for ever ends the process by a signal, before the server, whose patience is 30 seconds, ends the connection.
+constexpr unsigned PATIENCE_SECONDS = 20;
 
 int g_port = 0;
 
@@ -87,11 +87,13 @@ public:
     return Describe(handshake);
   }
 
-  std::string Read() {
+  Testing::Completion BeginRead() {
     Testing::Completion read;
     m_stream->AsyncReadSome(m_buffer, sizeof m_buffer, read.ForTransfer());
-    return Describe(read);
+    return read;
   }
+
+  std::string Read() { return Describe(BeginRead()); }
 
   std::string Write() {
     Testing::Completion written;
@@ -101,13 +103,13 @@ public:
 
   void Close() { m_stream->Close(); }
 
-private:
   static std::string Describe(const Testing::Completion &completion) {
     const std::string message = completion.GetMessage();
     return (completion.FailedWith<Tarvel::InvalidStateException>() ? "InvalidStateException: " : "") + message +
            (completion.GetCalls() == 1 ? "" : " (not called once)");
   }
 
+private:
   Ref<Tarvel::Ssl::SSLStream> m_stream;
   char m_buffer[16];
 };
@@ -133,11 +135,14 @@ private:
 };
 Host g_host;
 
-/// What the server sees of the operation, it writes to our standard input.
+/// The server writes to our standard input once it has what it waits for. After that the operation waits for the server.
 void WaitForServer() {
   char byte = 0;
   while (read(STDIN_FILENO, &byte, 1) < 0) {
   }
+  // Twice: what the server has got may be sent by a step that has not ended, and whose end is one more step.
+  Testing::DrainIoThreads();
+  Testing::DrainIoThreads();
 }
 
 std::shared_ptr<const SsoClient::SamlToken> AcquireToken(const Ref<Tarvel::Ssl::SSLContext> &context) {
@@ -165,9 +170,9 @@ void WaitInHandshake() {
 void WaitInRead() {
   const auto connection = std::make_shared<Connection>(CreateTrustingContext());
   connection->ShakeHands();
-  g_host.Start([connection] {
-    connection->Read(); // what lets us know that the next one waits for a server that is silent
-    std::cout << "read: " << connection->Read() << std::endl;
+  const Testing::Completion read = connection->BeginRead();
+  g_host.Start([connection, read] {
+    std::cout << "read: " << Connection::Describe(read) << std::endl;
     std::cout << "read again: " << connection->Read() << std::endl;
   });
   WaitForServer();
