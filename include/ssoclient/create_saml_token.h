@@ -27,7 +27,10 @@ constexpr std::int64_t DEFAULT_CLOCK_TOLERANCE_SEC = 600;
 /// @throws ParseException when it is not an assertion of the accepted form, is inconsistent, expired or not valid yet.
 /// @throws InvalidSignatureException when none of the trusted keys made its signature, when it was changed since, or
 ///         when the signature is outside the accepted profile: another algorithm, more than ten references, an
-///         identifier that no element bears, or more than one.
+///         identifier that no element bears, or more than one; or when a trusted key is not used: an RSA key of fewer than
+///         2048 bits or with an exponent that is even or 1.
+/// @throws Tarvel::OutOfMemoryException, and Tarvel::InvalidStateException when OpenSSL has cleaned itself up because the
+///         process ends. Neither is a verdict on the token.
 SSOCLIENT_API std::shared_ptr<const SamlToken>
 CreateSamlToken(const std::string &xml, const Tarvel::Crypto::CertificateList &trustedCertificates,
                 std::int64_t clockToleranceSec);

@@ -37,6 +37,8 @@ namespace SsoClient {
 /// - `Tarvel::Xml::Security::XmlSecurityException` for an identity whose key cannot sign with RSA-SHA256 (an EC key),
 /// - `Tarvel::Xml::Security::XmlSecurityException` or `Tarvel::Xml::XMLParseException` for an assertion in the response
 ///   that cannot be taken out of it as a document of its own.
+/// - `Tarvel::OutOfMemoryException`, and `Tarvel::InvalidStateException` when OpenSSL has cleaned itself up because the process
+///   ends, where a token or a request was in hand; on the way to the service and back, both are `CommunicationException`.
 /// All of them are `Tarvel::Exception`. Nothing is tried again. A token that is returned is never null.
 class SSOCLIENT_API SecurityTokenService {
 public:

@@ -2,8 +2,6 @@
 
 #include "transport/connection_spec_impl.h"
 
-#include "transport/out_of_memory.h"
-
 #include <ssoclient/connection_spec.h>
 #include <tarvel/core/exception.h>
 #include <tarvel/core/message_formatter.h>
@@ -75,7 +73,8 @@ void OnSocketConnected(const TlsLayer &layer, const Ref<Stream> &socket, const E
   } catch (const Exception &exception) {
     completion(socket, &exception);
   } catch (const std::bad_alloc &) {
-    completion(socket, &OutOfMemory());
+    const Tarvel::OutOfMemoryException noMemory;
+    completion(socket, &noMemory);
   }
 }
 
@@ -143,7 +142,6 @@ bool SsoCustomSslConnectionSpecImpl::IsReuseOnAuthErrorSupported() const {
 
 Ref<ScheduledItem> SsoCustomSslConnectionSpecImpl::AsyncConnect(ConnectCompletion completion) const {
   TlsLayer layer{m_inner->GetConnectionTargetHost(), GetEndpointString(), m_context, m_parameter};
-  OutOfMemory(); // made while there is memory
   return m_inner->AsyncConnect([layer = std::move(layer), completion = std::move(completion)](
                                    const Ref<Stream> &socket, const Exception *failure) {
     OnSocketConnected(layer, socket, failure, completion);

@@ -2,8 +2,6 @@
 
 #include "transport/https_session.h"
 
-#include "transport/out_of_memory.h"
-
 #include <ssoclient/exceptions.h>
 #include <tarvel/http/cookie_store.h>
 
@@ -32,7 +30,6 @@ bool HasBody(int status) {
 HttpsSession::HttpsSession(const Ref<Tarvel::Http::ConnectionSpec> &spec, const std::string &path,
                            std::int64_t timeoutMicroseconds)
     : m_path(path), m_timeoutMicroseconds(timeoutMicroseconds) {
-  OutOfMemory(); // made while there is memory
   Ref<Tarvel::Http::CookieStore> cookies;
   Tarvel::Http::CreateCookieStore("", cookies);
   Tarvel::Http::CreateHttpUserAgent(spec, cookies, nullptr, m_userAgent);
@@ -100,7 +97,8 @@ void AsyncTranslateResponse(const TransportSession::Completion &completion, cons
   try {
     TranslateResponse(exception, response, error, body);
   } catch (const std::bad_alloc &) {
-    completion(&OutOfMemory(), nullptr);
+    const Tarvel::OutOfMemoryException noMemory;
+    completion(&noMemory, nullptr);
     return;
   }
   completion(error.get(), body.get());

@@ -46,6 +46,7 @@ SSL_CTX *CreateTls(const TlsSettings &settings) {
   if (settings.allowsWeakness) {
     SSL_CTX_set_security_level(tls, 0);
   }
+  Require(settings.ciphers.empty() || SSL_CTX_set_cipher_list(tls, settings.ciphers.c_str()) == 1, "bad ciphers");
   Require(SSL_CTX_set_min_proto_version(tls, settings.minimumVersion) == 1, "bad minimum version");
   Require(SSL_CTX_set_max_proto_version(tls, settings.maximumVersion) == 1, "bad maximum version");
   Require(SSL_CTX_use_certificate_chain_file(tls, TlsFile(settings.certificate + ".crt").c_str()) == 1,

@@ -30,6 +30,7 @@ struct TlsSettings {
   int maximumVersion = 0;      ///< likewise
   bool demandsClient = false;  ///< a certificate that chains to "authority" through "intermediate"
   bool allowsWeakness = false; ///< security level 0, without which OpenSSL offers no TLS 1.1
+  std::string ciphers;         ///< of TLS 1.2, in OpenSSL's form; empty for OpenSSL's own choice
   bool resumesSessions = true;
   std::size_t tickets = 2; ///< of TLS 1.3, for each full handshake
 };

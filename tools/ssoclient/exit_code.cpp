@@ -75,6 +75,7 @@ constexpr Row TABLE[] = {
     // All arguments of the library come from the command line: an address, a name that XML cannot carry.
     {IsA<Tarvel::Http::MalformedURLException>, {ExitCode::USAGE, "MalformedURLException", "usage"}},
     {IsA<Tarvel::InvalidArgumentException>, {ExitCode::USAGE, "InvalidArgumentException", "usage"}},
+    {IsA<Tarvel::OutOfMemoryException>, {ExitCode::UNEXPECTED, "OutOfMemoryException", "out of memory"}},
     {IsA<Tarvel::InvalidStateException>, {ExitCode::UNEXPECTED, "InvalidStateException", "unexpected failure"}},
     {IsA<Tarvel::Exception>, {ExitCode::UNEXPECTED, "Exception", "unexpected failure"}},
     {IsA<std::bad_alloc>, {ExitCode::UNEXPECTED, "bad_alloc", "out of memory"}},

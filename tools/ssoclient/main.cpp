@@ -7,6 +7,8 @@
 #include "interruption.h"
 #include "standard_streams.h"
 
+#include <tarvel/crypto/system_configuration.h>
+
 #include <CLI/CLI.hpp>
 
 #include <exception>
@@ -107,12 +109,15 @@ int Run(int argc, char **argv) {
   app.require_subcommand(1);
 
   OutputOptions output;
+  bool usesSystemCrypto = false;
   Action chosen;
   for (const Command &command : COMMANDS) {
     CLI::App *sub = app.add_subcommand(command.name, command.summary);
     sub->footer(std::string("Examples:\n") + command.examples);
     sub->final_callback([&chosen, action = command.define(*sub, output)] { chosen = action; });
     AddOutputOptions(*sub, output);
+    sub->add_flag("--system-crypto", usesSystemCrypto,
+                  "Use OpenSSL as the machine has configured it, with its providers (FIPS, PKCS#11) and TLS settings");
   }
 
   try {
@@ -124,6 +129,9 @@ int Run(int argc, char **argv) {
   }
   if (output.verbose) {
     ShowLibraryLog();
+  }
+  if (usesSystemCrypto) {
+    Tarvel::Crypto::UseSystemConfiguration();
   }
   return static_cast<int>(chosen());
 }

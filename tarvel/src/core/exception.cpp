@@ -62,17 +62,18 @@ struct Exception::State {
 __attribute__((noinline)) Exception::Exception(const std::string &message)
     : m_state(std::make_shared<const State>(message, __builtin_return_address(0))) {}
 
+Exception::Exception() noexcept = default;
 Exception::Exception(const Exception &) noexcept = default;
 Exception &Exception::operator=(const Exception &) noexcept = default;
 Exception::~Exception() = default;
 
 const char *Exception::what() const noexcept {
-  return m_state->message.c_str();
+  return m_state ? m_state->message.c_str() : "";
 }
 
 std::string Exception::GetBacktrace() const {
   std::string text;
-  for (const Address address : m_state->Stack()) {
+  for (const Address address : m_state ? m_state->Stack() : std::span<const Address>()) {
     text += boost::stacktrace::to_string(boost::stacktrace::frame(address));
     text += '\n';
   }
@@ -80,11 +81,11 @@ std::string Exception::GetBacktrace() const {
 }
 
 std::string Exception::Dump() const {
-  return Demangle(typeid(*this).name()) + ": " + m_state->message + '\n' + GetBacktrace();
+  return Demangle(typeid(*this).name()) + ": " + what() + '\n' + GetBacktrace();
 }
 
 std::string Exception::Where() const {
-  for (const Address address : m_state->Stack()) {
+  for (const Address address : m_state ? m_state->Stack() : std::span<const Address>()) {
     const boost::stacktrace::frame frame(address);
     if (!IsExceptionConstructor(frame.name())) {
       return boost::stacktrace::to_string(frame);
@@ -106,10 +107,14 @@ InvalidArgumentException::InvalidArgumentException(const std::string &detail)
 
 TARVEL_DEFINE_EXCEPTION(InvalidArgumentException)
 TARVEL_DEFINE_EXCEPTION(InvalidStateException)
-TARVEL_DEFINE_EXCEPTION(OutOfMemoryException)
 TARVEL_DEFINE_EXCEPTION(TypeMismatchException)
 TARVEL_DEFINE_EXCEPTION(Base64FormatException)
 TARVEL_DEFINE_EXCEPTION(DateTimeFormatException)
 TARVEL_DEFINE_EXCEPTION(IOException)
+TARVEL_DEFINE_EXCEPTION(OutOfMemoryException)
+
+const char *OutOfMemoryException::what() const noexcept {
+  return "There is not enough memory";
+}
 
 } // namespace Tarvel

@@ -4,6 +4,7 @@
 
 #include "crypto/certificate_impl.h"
 #include "crypto/key_file.h"
+#include "crypto/library_context.h"
 #include "crypto/openssl_errors.h"
 #include "crypto/openssl_handles.h"
 #include "crypto/pem_reader.h"
@@ -23,10 +24,15 @@ Ref<const Certificate> DecodeBlock(PemBlock &block) {
 }
 
 bool IsPrivateKeyInDer(std::string_view bytes) {
+  const OpenSslUse use;
+  use.Require();
   const OpenSslErrorScope errors;
   const auto *position = reinterpret_cast<const unsigned char *>(bytes.data());
   const long length = static_cast<long>(bytes.size());
-  const KeyHandle key(d2i_AutoPrivateKey(nullptr, &position, length));
+  const KeyHandle key(d2i_AutoPrivateKey_ex(nullptr, &position, length, GetLibraryContext(), nullptr));
+  if (!key) {
+    errors.RequireMemory();
+  }
   return key != nullptr;
 }
 

@@ -2,18 +2,20 @@
 
 #include "crypto/certificate_impl.h"
 
+#include "crypto/library_context.h"
 #include "crypto/openssl_errors.h"
 #include "crypto/openssl_use.h"
 
 #include <tarvel/core/ref.h>
 
+#include <openssl/bn.h>
+#include <openssl/core_names.h>
 #include <openssl/pem.h>
 
 #include <array>
 #include <chrono>
 #include <ctime>
 #include <limits>
-#include <new>
 #include <string>
 #include <typeinfo>
 
@@ -32,9 +34,18 @@ CertificateHandle Decode(const std::vector<std::uint8_t> &der) {
     throw CryptoException("Certificate of " + std::to_string(der.size()) + " bytes does not decode");
   }
   const unsigned char *position = der.data();
-  CertificateHandle native(d2i_X509(nullptr, &position, static_cast<long>(der.size())));
+  X509 *blank = X509_new_ex(GetLibraryContext(), nullptr);
+  if (!blank) {
+    throw OutOfMemoryException();
+  }
+  CertificateHandle native(d2i_X509(&blank, &position, static_cast<long>(der.size()))); // frees it when it fails
   if (!native) {
     errors.Throw("Certificate does not decode");
+  }
+  // Without a key, or without its size, it is of an algorithm that OpenSSL does not know; but it keeps silent about memory.
+  EVP_PKEY *const key = X509_get0_pubkey(native.get());
+  if (!key || EVP_PKEY_get_bits(key) <= 0) {
+    errors.RequireMemory();
   }
   if (position != der.data() + der.size()) {
     throw CryptoException("Certificate is followed by " + std::to_string(der.data() + der.size() - position) +
@@ -74,7 +85,9 @@ std::int64_t ToUtcMicroseconds(const ASN1_TIME *time) {
 
 KeyKind FindCurve(EVP_PKEY *key) {
   std::array<char, MAX_CURVE_NAME_BYTES> name{};
+  const OpenSslErrorScope errors;
   if (EVP_PKEY_get_group_name(key, name.data(), name.size(), nullptr) != 1) {
+    errors.RequireMemory();
     return KeyKind::OTHER;
   }
   const std::string_view curve = name.data();
@@ -88,7 +101,6 @@ KeyKind FindCurve(EVP_PKEY *key) {
 }
 
 KeyKind FindKeyKind(EVP_PKEY *key) {
-  const OpenSslErrorScope errors;
   if (!key) {
     return KeyKind::OTHER;
   }
@@ -96,6 +108,18 @@ KeyKind FindKeyKind(EVP_PKEY *key) {
     return KeyKind::RSA;
   }
   return EVP_PKEY_is_a(key, "EC") ? FindCurve(key) : KeyKind::OTHER;
+}
+
+// With an exponent of 1 everybody can sign, and an even one belongs to no private key (RFC 8017, section 3.1).
+bool IsExponentSound(EVP_PKEY *key) {
+  const OpenSslErrorScope errors;
+  BIGNUM *read = nullptr;
+  const int isRead = EVP_PKEY_get_bn_param(key, OSSL_PKEY_PARAM_RSA_E, &read);
+  const BignumHandle exponent(read);
+  if (isRead != 1) {
+    errors.Throw("The RSA key's exponent cannot be read");
+  }
+  return BN_is_odd(exponent.get()) && !BN_is_one(exponent.get()) && !BN_is_negative(exponent.get());
 }
 
 std::string TakeBioText(BIO *bio) {
@@ -107,7 +131,7 @@ std::string TakeBioText(BIO *bio) {
 BioHandle NewMemoryBio() {
   BioHandle bio(BIO_new(BIO_s_mem()));
   if (!bio) {
-    throw std::bad_alloc();
+    throw OutOfMemoryException();
   }
   return bio;
 }
@@ -137,7 +161,11 @@ CertificateImpl::CertificateImpl(const std::uint8_t *data, std::size_t length)
   const OpenSslErrorScope errors;
   m_nativeKey = X509_get0_pubkey(m_native.get());
   m_keyKind = FindKeyKind(m_nativeKey);
+  if (m_keyKind == KeyKind::OTHER) {
+    errors.RequireMemory();
+  }
   m_keyBits = m_nativeKey ? static_cast<unsigned>(EVP_PKEY_get_bits(m_nativeKey)) : 0;
+  m_hasSoundExponent = m_keyKind != KeyKind::RSA || IsExponentSound(m_nativeKey);
 }
 
 std::string CertificateImpl::GetSubject() const {

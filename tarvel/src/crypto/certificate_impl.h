@@ -14,7 +14,8 @@ namespace Tarvel::Crypto {
 
 class CertificateImpl final : public Certificate {
 public:
-  /// @throws CryptoException when `data` is not the DER encoding of one certificate, whole and canonical.
+  /// @throws CryptoException when `data` is not the DER encoding of one certificate, whole and canonical;
+  ///         InvalidStateException when OpenSSL has cleaned itself up; OutOfMemoryException.
   CertificateImpl(const std::uint8_t *data, std::size_t length);
 
   const std::vector<std::uint8_t> &GetDer() const noexcept override { return m_der; }
@@ -27,6 +28,7 @@ public:
 
   KeyKind GetKeyKind() const noexcept { return m_keyKind; }
   unsigned GetKeyBits() const noexcept { return m_keyBits; }
+  bool HasSoundExponent() const noexcept { return m_hasSoundExponent; }
   VerifyContexts &GetVerifyContexts() const noexcept { return m_verifyContexts; }
 
   /// Owned by the certificate. The key is null when OpenSSL does not know its algorithm.
@@ -41,6 +43,7 @@ private:
   EVP_PKEY *m_nativeKey = nullptr; // owned by m_native
   KeyKind m_keyKind = KeyKind::OTHER;
   unsigned m_keyBits = 0;
+  bool m_hasSoundExponent = false;
   std::int64_t m_notBefore = 0; // microseconds since the epoch
   std::int64_t m_notAfter = 0;
   mutable VerifyContexts m_verifyContexts;

@@ -3,6 +3,7 @@
 #include "crypto/digest.h"
 
 #include "crypto/digest_method.h"
+#include "crypto/library_context.h"
 #include "crypto/openssl_errors.h"
 #include "crypto/openssl_handles.h"
 
@@ -13,7 +14,7 @@ namespace {
 // Held to the end of the process: OpenSSL may have cleaned itself up before our own destructors run.
 const EVP_MD *FetchDigestMethod(const char *name) {
   const OpenSslErrorScope errors;
-  const EVP_MD *const method = EVP_MD_fetch(nullptr, name, nullptr);
+  const EVP_MD *const method = EVP_MD_fetch(GetLibraryContext(), name, nullptr);
   if (!method) {
     errors.Throw(std::string("The cryptographic library does not offer ") + name);
   }
@@ -44,6 +45,7 @@ const EVP_MD *GetDigestMethod(DigestAlgorithm algorithm) {
 }
 
 Digest::Digest(DigestAlgorithm algorithm) : m_context(nullptr) {
+  OpenSslUse::Prepare();
   m_use.Require();
   const EVP_MD *const method = GetDigestMethod(algorithm);
   const OpenSslErrorScope errors;

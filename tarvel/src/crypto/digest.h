@@ -24,12 +24,14 @@ constexpr std::size_t DigestBytes(DigestAlgorithm algorithm) noexcept {
 /// A digest in the making. For one thread.
 class Digest {
 public:
-  /// @throws CryptoException when the cryptographic library does not offer the algorithm, or has cleaned itself up.
+  /// @throws CryptoException when the cryptographic library does not offer the algorithm; InvalidStateException when it has
+  ///         cleaned itself up; OutOfMemoryException.
   explicit Digest(DigestAlgorithm algorithm);
   Digest(const Digest &) = delete;
   Digest &operator=(const Digest &) = delete;
   ~Digest();
 
+  /// This and `Finish`: @throws CryptoException, OutOfMemoryException
   void Update(std::string_view bytes);
 
   /// Writes `DigestBytes(algorithm)` bytes to `out`; the digest must not be used afterwards.

@@ -3,6 +3,7 @@
 #include <tarvel/crypto/private_key.h>
 
 #include "crypto/key_file.h"
+#include "crypto/library_context.h"
 #include "crypto/openssl_errors.h"
 #include "crypto/openssl_handles.h"
 #include "crypto/passphrase.h"
@@ -24,7 +25,12 @@ Pkcs12Handle Decode(std::string_view der) {
   const OpenSslErrorScope errors;
   const auto *const begin = reinterpret_cast<const unsigned char *>(der.data());
   const unsigned char *position = begin;
-  Pkcs12Handle store(d2i_PKCS12(nullptr, &position, static_cast<long>(der.size())));
+  // The context is kept with the store.
+  PKCS12 *blank = PKCS12_init_ex(NID_pkcs7_data, GetLibraryContext(), nullptr);
+  if (!blank) {
+    throw OutOfMemoryException();
+  }
+  Pkcs12Handle store(d2i_PKCS12(&blank, &position, static_cast<long>(der.size()))); // frees it when it fails
   if (!store) {
     errors.Throw("The PKCS#12 key store does not decode");
   }
@@ -37,7 +43,11 @@ Pkcs12Handle Decode(std::string_view der) {
 // An empty password is written in two ways, as no characters and as none at all; both need no asking.
 bool OpensWithoutPassphrase(PKCS12 *store) {
   const OpenSslErrorScope errors;
-  return PKCS12_verify_mac(store, nullptr, 0) == 1 || PKCS12_verify_mac(store, "", 0) == 1;
+  const bool opens = PKCS12_verify_mac(store, nullptr, 0) == 1 || PKCS12_verify_mac(store, "", 0) == 1;
+  if (!opens) {
+    errors.RequireMemory();
+  }
+  return opens;
 }
 
 // The passphrase that opens the store; empty when none is needed.
@@ -59,6 +69,7 @@ const std::string &FindPassphrase(PKCS12 *store, Passphrase &passphrase) {
 
 NativeKeyStore Open(PKCS12 *store, const std::string &passphrase) {
   const OpenSslErrorScope errors;
+  const LibraryContextScope context;
   EVP_PKEY *key = nullptr;
   X509 *certificate = nullptr;
   STACK_OF(X509) *others = nullptr;
@@ -67,6 +78,7 @@ NativeKeyStore Open(PKCS12 *store, const std::string &passphrase) {
   if (opened != 1) {
     errors.Throw("The PKCS#12 key store cannot be read");
   }
+  errors.RequireMemory(); // without which certificates are left out and nothing is said
   return native;
 }
 
@@ -84,8 +96,11 @@ Ref<const Certificate> ToCertificate(X509 *native) {
 } // namespace
 
 KeyStore CreateKeyStoreFromPkcs12(std::string_view der, const PassphraseCallback &passphrase) {
+  OpenSslUse::Prepare();
+  OpenSslUse use;
+  use.Require();
   const Pkcs12Handle store = Decode(der);
-  Passphrase secret(passphrase);
+  Passphrase secret(passphrase, use);
   NativeKeyStore native = Open(store.get(), FindPassphrase(store.get(), secret));
   if (!native.key) {
     throw NoKeyException("There is no private key in the PKCS#12 key store");

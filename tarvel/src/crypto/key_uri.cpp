@@ -2,6 +2,7 @@
 
 #include "crypto/key_uri.h"
 
+#include "crypto/library_context.h"
 #include "crypto/openssl_errors.h"
 #include "crypto/openssl_handles.h"
 #include "crypto/passphrase.h"
@@ -11,7 +12,6 @@
 
 #include <algorithm>
 #include <exception>
-#include <new>
 
 namespace Tarvel::Crypto {
 
@@ -48,6 +48,7 @@ int AnswerPassphrase(char *buffer, int size, int, void *data) noexcept {
   if (question.failure) {
     std::rethrow_exception(question.failure);
   }
+  errors.RequireMemory();
   if (question.asked) {
     throw WrongPassphraseException(errors.Describe("The passphrase of the private key is wrong"));
   }
@@ -61,7 +62,7 @@ int AnswerPassphrase(char *buffer, int size, int, void *data) noexcept {
 KeyHandle LoadNextKey(OSSL_STORE_CTX *store, const OpenSslErrorScope &errors, const PassphraseQuestion &question) {
   while (!OSSL_STORE_eof(store)) {
     const StoreInfoHandle info(OSSL_STORE_load(store));
-    if (!info && (errors.PeekNewest() != 0 || question.failure)) {
+    if (!info && (errors.PeekNewest() != 0 || errors.RanOutOfMemory() || question.failure)) {
       ThrowStoreFailure(errors, question);
     }
     if (!info && OSSL_STORE_error(store)) {
@@ -87,19 +88,23 @@ bool IsKeyUri(const std::string &text) {
 }
 
 Ref<const PrivateKey> LoadPrivateKeyFromUri(const std::string &uri, const PassphraseCallback &passphrase) {
+  OpenSslUse::Prepare();
+  OpenSslUse use;
+  use.Require();
   const OpenSslErrorScope errors;
-  PassphraseQuestion question{Passphrase(passphrase), false, nullptr};
+  PassphraseQuestion question{Passphrase(passphrase, use), false, nullptr};
   // Without a method of ours, a loader would ask on the terminal of the host.
   const UiMethodHandle ui(UI_UTIL_wrap_read_pem_callback(AnswerPassphrase, 0));
   if (!ui) {
-    throw std::bad_alloc();
+    throw OutOfMemoryException();
   }
-  const StoreHandle store(OSSL_STORE_open(uri.c_str(), ui.get(), &question, nullptr, nullptr));
+  const StoreHandle store(
+      OSSL_STORE_open_ex(uri.c_str(), GetLibraryContext(), nullptr, ui.get(), &question, nullptr, nullptr, nullptr));
   if (!store || OSSL_STORE_expect(store.get(), OSSL_STORE_INFO_PKEY) != 1) {
     ThrowStoreFailure(errors, question);
   }
   KeyHandle key = LoadNextKey(store.get(), errors, question);
-  if (!key && question.asked) {
+  if (!key && (question.asked || errors.RanOutOfMemory())) {
     ThrowStoreFailure(errors, question);
   }
   if (!key) {

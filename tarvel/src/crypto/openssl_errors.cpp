@@ -7,6 +7,8 @@
 #include <openssl/err.h>
 
 #include <array>
+#include <cerrno>
+#include <utility>
 
 namespace Tarvel::Crypto {
 
@@ -26,7 +28,11 @@ std::string DescribeError(unsigned long code, const char *data, int flags) {
 
 } // namespace
 
-OpenSslErrorScope::OpenSslErrorScope() noexcept {
+// OpenSSL does not always put a failed allocation on its queue: it may have none for want of memory, or take the error off
+// again because it means to try something else. But then `malloc` has set errno, which nothing in OpenSSL's computations
+// resets.
+OpenSslErrorScope::OpenSslErrorScope() noexcept : m_errnoOfHost(errno) {
+  errno = 0;
   if (ERR_peek_last_error_all(&m_newestOfHost, nullptr, nullptr, nullptr, nullptr) == 0) {
     m_newestOfHost = nullptr;
   }
@@ -35,31 +41,57 @@ OpenSslErrorScope::OpenSslErrorScope() noexcept {
 
 // Without an entry to mark, OpenSSL sets no mark, and popping to the mark empties the queue: as it was found.
 OpenSslErrorScope::~OpenSslErrorScope() {
+  const bool ranOut = errno == ENOMEM; // for a scope around this one
   ERR_pop_to_mark();
+  errno = ranOut ? ENOMEM : m_errnoOfHost;
+}
+
+void OpenSslErrorScope::Note(unsigned long code, const char *data, int flags) const {
+  m_newest = code;
+  m_ranOutOfMemory = m_ranOutOfMemory || ERR_GET_REASON(code) == ERR_R_MALLOC_FAILURE;
+  m_text.append(m_text.empty() ? "" : "; ").append(DescribeError(code, data, flags));
+}
+
+void OpenSslErrorScope::Collect() const {
+  m_ranOutOfMemory = m_ranOutOfMemory || errno == ENOMEM;
+  const char *data = nullptr;
+  int flags = 0;
+  if (!m_newestOfHost) {
+    while (const unsigned long code = ERR_get_error_all(nullptr, nullptr, nullptr, &data, &flags)) {
+      Note(code, data, flags);
+    }
+    return;
+  }
+  if (const unsigned long newest = PeekNewest(); newest != 0 && newest != m_newest) {
+    ERR_peek_last_error_data(&data, &flags);
+    Note(newest, data, flags);
+  }
+}
+
+bool OpenSslErrorScope::RanOutOfMemory() const {
+  Collect();
+  return m_ranOutOfMemory;
+}
+
+void OpenSslErrorScope::RequireMemory() const {
+  if (RanOutOfMemory()) {
+    throw OutOfMemoryException();
+  }
 }
 
 unsigned long OpenSslErrorScope::PeekNewest() const noexcept {
   const char *entry = nullptr;
   const unsigned long newest = ERR_peek_last_error_all(&entry, nullptr, nullptr, nullptr, nullptr);
-  return newest != 0 && entry == m_newestOfHost ? 0 : newest;
+  return newest == 0 || entry == m_newestOfHost ? m_newest : newest;
 }
 
 std::string OpenSslErrorScope::TakeText() const {
-  const char *data = nullptr;
-  int flags = 0;
-  if (m_newestOfHost) {
-    const unsigned long newest = PeekNewest();
-    ERR_peek_last_error_data(&data, &flags);
-    return newest == 0 ? std::string() : DescribeError(newest, data, flags);
-  }
-  std::string text;
-  while (const unsigned long code = ERR_get_error_all(nullptr, nullptr, nullptr, &data, &flags)) {
-    text.append(text.empty() ? "" : "; ").append(DescribeError(code, data, flags));
-  }
-  return text;
+  Collect();
+  return std::exchange(m_text, {});
 }
 
 std::string OpenSslErrorScope::Describe(const std::string &message) const {
+  RequireMemory();
   const std::string text = TakeText();
   return text.empty() ? message : message + ": " + text;
 }

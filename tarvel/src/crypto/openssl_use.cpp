@@ -2,13 +2,14 @@
 
 #include "crypto/openssl_use.h"
 
+#include "crypto/library_context.h"
+#include "crypto/openssl_end.h"
 #include "crypto/openssl_errors.h"
 #include "system/thread_lane.h"
 
-#include <tarvel/crypto/certificate.h>
+#include <tarvel/core/exception.h>
 
 #include <openssl/crypto.h>
-#include <openssl/ssl.h>
 
 #include <algorithm>
 #include <array>
@@ -18,6 +19,7 @@
 #include <mutex>
 #include <new>
 #include <thread>
+#include <utility>
 
 namespace Tarvel::Crypto {
 
@@ -63,6 +65,7 @@ void OnCleanUp() noexcept {
   for (auto waited = WAIT_STEP; IsAnyGoingOn() && waited < MAX_WAIT; waited += WAIT_STEP) {
     std::this_thread::sleep_for(WAIT_STEP);
   }
+  OpenSslEndNotice::CallAll();
 }
 
 } // namespace
@@ -70,14 +73,23 @@ void OnCleanUp() noexcept {
 OpenSslUse::OpenSslUse() noexcept : m_count(TryBegin()) {}
 
 OpenSslUse::~OpenSslUse() {
+  Suspend();
+}
+
+void OpenSslUse::Suspend() noexcept {
   if (m_count) {
-    m_count->fetch_sub(1);
+    std::exchange(m_count, nullptr)->fetch_sub(1);
   }
+}
+
+bool OpenSslUse::Resume() noexcept {
+  m_count = TryBegin();
+  return m_count != nullptr;
 }
 
 void OpenSslUse::Require() const {
   if (!m_count) {
-    throw CryptoException("OpenSSL has cleaned itself up: the process is about to end");
+    throw InvalidStateException(ENDED);
   }
 }
 
@@ -91,9 +103,10 @@ void OpenSslUse::Abandon(void *object) noexcept {
 void OpenSslUse::Prepare() {
   static std::once_flag registered;
   std::call_once(registered, [] {
-    const OpenSslErrorScope errors;
     // In this order, for it is OpenSSL's own initialisation that arranges for the clean-up.
-    if (OPENSSL_init_ssl(0, nullptr) != 1 || OPENSSL_atexit(OnCleanUp) != 1) {
+    InitialiseOpenSsl();
+    const OpenSslErrorScope errors;
+    if (OPENSSL_atexit(OnCleanUp) != 1) {
       errors.Throw("Cannot initialise OpenSSL");
     }
   });

@@ -24,11 +24,18 @@ public:
   /// False once the clean-up has begun: then OpenSSL must not be called any more, not even to free what it made.
   explicit operator bool() const noexcept { return m_count != nullptr; }
 
-  /// @throws CryptoException once the clean-up has begun.
+  /// @throws InvalidStateException, with `ENDED` for its text, once the clean-up has begun.
   void Require() const;
 
-  /// Has OpenSSL tell of its clean-up. Called before the first use; any number of times.
-  /// @throws CryptoException
+  static constexpr const char *ENDED = "OpenSSL has cleaned itself up: the process is about to end";
+
+  /// While the code of somebody else runs in the middle of a use, which may take its time, or fork. Afterwards the use goes on;
+  /// false once the clean-up has begun.
+  void Suspend() noexcept;
+  bool Resume() noexcept;
+
+  /// Initialises OpenSSL and has it report its clean-up. Called before the first use; any number of times.
+  /// @throws CryptoException, OutOfMemoryException, and InvalidStateException when OpenSSL has cleaned itself up.
   static void Prepare();
 
   /// Takes over an object of OpenSSL's that can no longer be freed. It stays reachable, so that whoever looks for leaks
@@ -37,7 +44,7 @@ public:
 
 private:
   const System::Computation m_computing;
-  std::atomic<std::uint32_t> *const m_count; // of the lane in which it began; null when it is not allowed
+  std::atomic<std::uint32_t> *m_count; // of the lane in which it began; null when it is not allowed
 };
 
 } // namespace Tarvel::Crypto

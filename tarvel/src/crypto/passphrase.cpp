@@ -12,19 +12,33 @@ Passphrase::~Passphrase() {
   SecureWipe(m_text);
 }
 
+// Asking may take as long as somebody types, and may start a program that asks.
+std::string Passphrase::Ask() {
+  m_use.Suspend();
+  try {
+    std::string answer = [this] {
+      const System::HostCall call;
+      return m_ask();
+    }();
+    m_use.Resume();
+    return answer;
+  } catch (...) {
+    m_use.Resume();
+    throw;
+  }
+}
+
 const std::string &Passphrase::Get() {
   if (!m_ask) {
     throw WrongPassphraseException("The private key is encrypted and there is no passphrase");
   }
   if (!m_asked) {
     m_asked = true;
-    std::string answer = [this] {
-      const System::HostCall call;
-      return m_ask();
-    }();
+    std::string answer = Ask();
     m_text.assign(answer);
     SecureWipe(answer); // a short text is not moved but copied: what is left of the answer is a secret too
   }
+  m_use.Require();
   return m_text;
 }
 

@@ -4,6 +4,8 @@
 
 #pragma once
 
+#include "crypto/openssl_use.h"
+
 #include <tarvel/crypto/private_key.h>
 
 #include <string>
@@ -13,18 +15,22 @@ namespace Tarvel::Crypto {
 /// Asks its callback at most once, on the thread that first needs the passphrase.
 class Passphrase {
 public:
-  /// `ask` must live as long as this.
-  explicit Passphrase(const PassphraseCallback &ask) : m_ask(ask) {}
+  /// `ask`, and `use` in the middle of which it is called, must live as long as this.
+  Passphrase(const PassphraseCallback &ask, OpenSslUse &use) : m_ask(ask), m_use(use) {}
   Passphrase(const Passphrase &) = delete;
   Passphrase &operator=(const Passphrase &) = delete;
   ~Passphrase();
 
   /// The passphrase, wiped with this object.
-  /// @throws WrongPassphraseException when there is no callback; whatever the callback throws.
+  /// @throws WrongPassphraseException when there is no callback; whatever the callback throws; InvalidStateException when
+  ///         OpenSSL has cleaned itself up meanwhile.
   const std::string &Get();
 
 private:
+  std::string Ask();
+
   const PassphraseCallback &m_ask;
+  OpenSslUse &m_use;
   bool m_asked = false;
   std::string m_text;
 };

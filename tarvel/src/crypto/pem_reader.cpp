@@ -7,8 +7,6 @@
 #include <openssl/err.h>
 #include <openssl/pem.h>
 
-#include <new>
-
 namespace Tarvel::Crypto {
 
 namespace {
@@ -40,9 +38,13 @@ PemReader::PemReader(std::string_view text) : m_blocksLeft(CountOccurrences(text
   if (text.size() > MAX_TEXT_BYTES) {
     throw CryptoException("PEM text of " + std::to_string(text.size()) + " bytes is too long");
   }
+  OpenSslUse::Prepare();
+  const OpenSslUse use;
+  use.Require();
+  const OpenSslErrorScope errors;
   m_bio.reset(BIO_new_mem_buf(text.data(), static_cast<int>(text.size())));
   if (!m_bio) {
-    throw std::bad_alloc();
+    throw OutOfMemoryException();
   }
 }
 
@@ -52,6 +54,8 @@ bool PemReader::Next(PemBlock &block) {
     return false;
   }
   --m_blocksLeft;
+  const OpenSslUse use;
+  use.Require();
   const OpenSslErrorScope errors;
   if (PEM_read_bio_ex(m_bio.get(), &block.m_label, &block.m_headers, &block.m_data, &block.m_length,
                       PEM_FLAG_SECURE | PEM_FLAG_EAY_COMPATIBLE) != 1) {

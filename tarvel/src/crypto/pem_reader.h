@@ -47,11 +47,12 @@ private:
 /// Gives the blocks of a text one after the other. The text must live as long as the reader.
 class PemReader {
 public:
-  /// @throws CryptoException when the text is longer than anything sensible (16 MiB).
+  /// @throws CryptoException when the text is longer than anything sensible (16 MiB); InvalidStateException when OpenSSL has
+  ///         cleaned itself up; OutOfMemoryException.
   explicit PemReader(std::string_view text);
 
   /// Reads the next block into `block`; false at the end of the text.
-  /// @throws CryptoException when a block has begun but is not well-formed.
+  /// @throws CryptoException when a block has begun but is not well-formed; the others as the constructor.
   bool Next(PemBlock &block);
 
   static bool LooksLikePem(std::string_view text) { return text.find(BEGIN_MARK) != std::string_view::npos; }

@@ -5,6 +5,7 @@
 #include "crypto/certificate_impl.h"
 #include "crypto/key_file.h"
 #include "crypto/key_uri.h"
+#include "crypto/library_context.h"
 #include "crypto/openssl_errors.h"
 #include "crypto/openssl_handles.h"
 #include "crypto/passphrase.h"
@@ -40,10 +41,11 @@ int GivePassphrase(char *buffer, int size, int, void *secret) {
   return static_cast<int>(text.size());
 }
 
-// PKCS#8 or one of the traditional forms, not encrypted. Null when it does not decode, or bytes follow it.
+// PKCS#8 or one of the traditional forms, not encrypted. Null when it does not decode, or bytes follow it; why not, the
+// caller's scope says.
 KeyHandle DecodePlain(std::string_view der) {
   const unsigned char *position = BytesOf(der);
-  KeyHandle key(d2i_AutoPrivateKey(nullptr, &position, static_cast<long>(der.size())));
+  KeyHandle key(d2i_AutoPrivateKey_ex(nullptr, &position, static_cast<long>(der.size()), GetLibraryContext(), nullptr));
   return key && position == BytesOf(der) + der.size() ? std::move(key) : nullptr;
 }
 
@@ -51,6 +53,9 @@ EncryptedKeyHandle DecodeEncrypted(std::string_view der) {
   const OpenSslErrorScope errors;
   const unsigned char *position = BytesOf(der);
   EncryptedKeyHandle encrypted(d2i_X509_SIG(nullptr, &position, static_cast<long>(der.size())));
+  if (!encrypted) {
+    errors.RequireMemory();
+  }
   return encrypted && position == BytesOf(der) + der.size() ? std::move(encrypted) : nullptr;
 }
 
@@ -58,14 +63,15 @@ EncryptedKeyHandle DecodeEncrypted(std::string_view der) {
 KeyHandle Decrypt(const X509_SIG *encrypted, Passphrase &passphrase) {
   const std::string &secret = passphrase.Get();
   const OpenSslErrorScope errors;
-  const PlainKeyHandle plain(PKCS8_decrypt(encrypted, secret.data(), static_cast<int>(secret.size())));
+  const PlainKeyHandle plain(
+      PKCS8_decrypt_ex(encrypted, secret.data(), static_cast<int>(secret.size()), GetLibraryContext(), nullptr));
   if (!plain && ERR_GET_REASON(errors.PeekNewest()) == ERR_R_UNSUPPORTED) {
     errors.Throw("The private key cannot be decrypted");
   }
   if (!plain) {
     throw WrongPassphraseException(errors.Describe(WRONG_PASSPHRASE));
   }
-  KeyHandle key(EVP_PKCS82PKEY(plain.get()));
+  KeyHandle key(EVP_PKCS82PKEY_ex(plain.get(), GetLibraryContext(), nullptr));
   if (!key) {
     errors.Throw(KEY_DOES_NOT_DECODE);
   }
@@ -92,6 +98,7 @@ bool DecryptInPlace(PemBlock &block, Passphrase &passphrase) {
   }
   std::string secret = passphrase.Get();
   long length = block.GetLength();
+  const LibraryContextScope context;
   const int decrypted = PEM_do_header(&cipher, block.GetData(), &length, GivePassphrase, &secret);
   SecureWipe(secret);
   if (decrypted != 1) {
@@ -133,7 +140,11 @@ KeyHandle DecodePem(std::string_view text, Passphrase &passphrase) {
 bool IsCertificateInDer(std::string_view der) {
   const OpenSslErrorScope errors;
   const unsigned char *position = BytesOf(der);
-  return CertificateHandle(d2i_X509(nullptr, &position, static_cast<long>(der.size()))) != nullptr;
+  const CertificateHandle certificate(d2i_X509(nullptr, &position, static_cast<long>(der.size())));
+  if (!certificate) {
+    errors.RequireMemory();
+  }
+  return certificate != nullptr;
 }
 
 KeyHandle DecodeDer(std::string_view der, Passphrase &passphrase) {
@@ -145,6 +156,7 @@ KeyHandle DecodeDer(std::string_view der, Passphrase &passphrase) {
   if (key) {
     return key;
   }
+  errors.RequireMemory();
   if (IsCertificateInDer(der)) {
     throw NoKeyException("There is a certificate, and no private key");
   }
@@ -161,7 +173,10 @@ PrivateKey::~PrivateKey() = default;
 
 Ref<const PrivateKey> CreatePrivateKey(std::string_view text, const PassphraseCallback &passphrase) {
   constexpr char DER_SEQUENCE = 0x30;
-  Passphrase secret(passphrase);
+  OpenSslUse::Prepare();
+  OpenSslUse use;
+  use.Require();
+  Passphrase secret(passphrase, use);
   if (PemReader::LooksLikePem(text)) {
     return MakeRef<PrivateKeyImpl>(DecodePem(text, secret));
   }
@@ -180,9 +195,12 @@ Ref<const PrivateKey> LoadPrivateKey(const std::string &pathOrUri, const Passphr
 }
 
 void RequireKeyMatchesCertificate(const PrivateKey &key, const Certificate &certificate) {
+  const OpenSslUse use;
+  use.Require();
   const OpenSslErrorScope errors;
   EVP_PKEY *const publicKey = AsImpl(certificate).GetNativeKey();
   if (!publicKey || EVP_PKEY_eq(publicKey, AsImpl(key).GetNative()) != 1) {
+    errors.RequireMemory();
     throw KeyMismatchException("The private key is not the one of the certificate " +
                                StringUtil::Shorten(certificate.GetSubject()));
   }

@@ -11,22 +11,23 @@
 namespace Tarvel::Crypto {
 
 PrivateKeyImpl::PrivateKeyImpl(KeyHandle native) : m_native(std::move(native)) {
-  OpenSslUse::Prepare();
+  const OpenSslUse use;
+  use.Require();
   const OpenSslErrorScope errors;
-  if (EVP_PKEY_is_a(m_native.get(), "RSA") || EVP_PKEY_is_a(m_native.get(), "EC")) {
-    return;
+  m_bits = static_cast<unsigned>(EVP_PKEY_get_bits(m_native.get()));
+  if (m_bits == 0) { // which OpenSSL looks up when it reads a key, and keeps silent about memory
+    throw OutOfMemoryException();
   }
+  for (const char *const algorithm : {"RSA", "EC"}) {
+    if (EVP_PKEY_is_a(m_native.get(), algorithm)) {
+      m_algorithm = algorithm;
+      return;
+    }
+  }
+  errors.RequireMemory();
   const char *const algorithm = EVP_PKEY_get0_type_name(m_native.get());
   throw CryptoException(std::string("Private key of algorithm ") + (algorithm ? algorithm : "unknown") +
                         ", which is neither RSA nor EC");
-}
-
-std::string PrivateKeyImpl::GetAlgorithm() const {
-  return EVP_PKEY_is_a(m_native.get(), "RSA") ? "RSA" : "EC";
-}
-
-unsigned PrivateKeyImpl::GetBits() const {
-  return static_cast<unsigned>(EVP_PKEY_get_bits(m_native.get()));
 }
 
 const PrivateKeyImpl &AsImpl(const PrivateKey &key) {

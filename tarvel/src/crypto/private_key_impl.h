@@ -12,11 +12,12 @@ namespace Tarvel::Crypto {
 
 class PrivateKeyImpl final : public PrivateKey {
 public:
-  /// @throws CryptoException when the key is neither RSA nor EC.
+  /// @throws CryptoException when the key is neither RSA nor EC; InvalidStateException when OpenSSL has cleaned itself up;
+  ///         OutOfMemoryException.
   explicit PrivateKeyImpl(KeyHandle native);
 
-  std::string GetAlgorithm() const override;
-  unsigned GetBits() const override;
+  std::string GetAlgorithm() const override { return m_algorithm; }
+  unsigned GetBits() const override { return m_bits; }
 
   /// Owned by the key; OpenSSL counts its own references to it.
   EVP_PKEY *GetNative() const noexcept { return m_native.get(); }
@@ -24,6 +25,8 @@ public:
 private:
   ~PrivateKeyImpl() override = default;
 
+  const char *m_algorithm = nullptr;
+  unsigned m_bits = 0;
   KeyHandle m_native; // OpenSSL wipes the numbers when it frees them
 };
 

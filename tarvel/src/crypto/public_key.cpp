@@ -4,6 +4,7 @@
 
 #include "crypto/certificate_impl.h"
 #include "crypto/digest_method.h"
+#include "crypto/library_context.h"
 #include "crypto/openssl_errors.h"
 #include "crypto/openssl_handles.h"
 #include "crypto/openssl_use.h"
@@ -58,7 +59,7 @@ bool SetScheme(EVP_PKEY_CTX *context, SignatureScheme scheme, DigestAlgorithm al
 
 KeyContextHandle NewVerifyContext(EVP_PKEY *key, SignatureScheme scheme, DigestAlgorithm algorithm) {
   const OpenSslErrorScope errors;
-  KeyContextHandle context(EVP_PKEY_CTX_new_from_pkey(nullptr, key, nullptr));
+  KeyContextHandle context(EVP_PKEY_CTX_new_from_pkey(GetLibraryContext(), key, nullptr));
   if (!context || EVP_PKEY_verify_init(context.get()) <= 0 || !SetScheme(context.get(), scheme, algorithm)) {
     errors.Throw("Failed to set up a signature check");
   }
@@ -109,6 +110,9 @@ bool Verify(EVP_PKEY_CTX *context, DigestAlgorithm algorithm, const std::uint8_t
   if (answer < 0) {
     errors.Throw("Failed to check a signature");
   }
+  if (answer == 0) {
+    errors.RequireMemory(); // OpenSSL answers no then as well
+  }
   return answer == 1;
 }
 
@@ -118,6 +122,10 @@ KeyKind GetKeyKind(const Certificate &certificate, unsigned &bits) {
   const CertificateImpl &impl = AsImpl(certificate);
   bits = impl.GetKeyBits();
   return impl.GetKeyKind();
+}
+
+bool HasSoundExponent(const Certificate &certificate) {
+  return AsImpl(certificate).HasSoundExponent();
 }
 
 bool VerifyDigest(const Certificate &certificate, SignatureScheme scheme, DigestAlgorithm algorithm,
@@ -155,7 +163,7 @@ std::vector<std::uint8_t> SignDigest(const PrivateKey &key, SignatureScheme sche
     throw CryptoException("A key of algorithm " + key.GetAlgorithm() + " cannot make a signature of this scheme");
   }
   EVP_PKEY *const native = AsImpl(key).GetNative();
-  const KeyContextHandle context(EVP_PKEY_CTX_new_from_pkey(nullptr, native, nullptr));
+  const KeyContextHandle context(EVP_PKEY_CTX_new_from_pkey(GetLibraryContext(), native, nullptr));
   std::size_t length = 0;
   if (!context || EVP_PKEY_sign_init(context.get()) <= 0 || !SetScheme(context.get(), scheme, algorithm) ||
       EVP_PKEY_sign(context.get(), nullptr, &length, digest, DigestBytes(algorithm)) <= 0) {

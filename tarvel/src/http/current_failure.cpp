@@ -31,8 +31,7 @@ std::shared_ptr<const Exception> CopyCurrentFailure(const std::string &endpoint)
 
 const std::shared_ptr<const Exception> &OutOfMemory() {
   // Never destroyed, as the threads that use it never end before the process does.
-  static const auto *const failure =
-      new std::shared_ptr<const Exception>(std::make_shared<OutOfMemoryException>("Out of memory"));
+  static const auto *const failure = new std::shared_ptr<const Exception>(std::make_shared<OutOfMemoryException>());
   return *failure;
 }
 

@@ -2,6 +2,7 @@
 
 #include "ssl/server_identity.h"
 
+#include "crypto/digest_method.h"
 #include "crypto/openssl_errors.h"
 
 #include <tarvel/core/string_util.h>
@@ -79,11 +80,13 @@ bool IsAddress(const std::string &host) noexcept {
 }
 
 std::string Sha256Thumbprint(const X509 *certificate) {
+  const Crypto::OpenSslErrorScope errors;
   constexpr std::string_view HEX = "0123456789abcdef";
   std::array<unsigned char, EVP_MAX_MD_SIZE> digest{};
   unsigned length = 0;
-  if (X509_digest(certificate, EVP_sha256(), digest.data(), &length) != 1 || length != SHA256_BYTES) {
-    return {};
+  const EVP_MD *const sha256 = Crypto::GetDigestMethod(Crypto::DigestAlgorithm::SHA256);
+  if (X509_digest(certificate, sha256, digest.data(), &length) != 1 || length != SHA256_BYTES) {
+    errors.Throw("the thumbprint of the server's certificate cannot be computed");
   }
   std::string text;
   for (std::size_t i = 0; i < SHA256_BYTES; ++i) {
@@ -133,11 +136,10 @@ void ServerIdentity::ApplyName(SSL *connection) const {
 }
 
 std::string ServerIdentity::RefuseByThumbprint(X509 *certificate) const {
-  const Crypto::OpenSslErrorScope errors;
-  const std::string actual = certificate ? Sha256Thumbprint(certificate) : std::string();
-  if (actual.empty()) {
+  if (!certificate) {
     return "the server showed no certificate";
   }
+  const std::string actual = Sha256Thumbprint(certificate);
   if (CRYPTO_memcmp(actual.data(), m_thumbprint.data(), DIGITS) == 0) {
     return {};
   }

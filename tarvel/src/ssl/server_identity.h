@@ -18,13 +18,14 @@ public:
   ServerIdentity(const std::string &host, const std::string &parameter);
 
   /// Sends the name, and has chain verification check it.
-  /// @throws SSLException
+  /// @throws SSLException, OutOfMemoryException
   void Apply(SSL *connection) const;
 
   /// Whether the thumbprint stands in for chain and name.
   bool HasThumbprint() const noexcept { return !m_thumbprint.empty(); }
 
   /// Why `certificate`, null for none, does not have the thumbprint; empty when it has.
+  /// @throws Crypto::CryptoException, OutOfMemoryException
   std::string RefuseByThumbprint(X509 *certificate) const;
 
   /// Two identities have the same text exactly when their checks are the same.

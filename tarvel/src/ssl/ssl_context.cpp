@@ -3,11 +3,13 @@
 #include <tarvel/ssl/ssl_context.h>
 
 #include "crypto/certificate_impl.h"
+#include "crypto/library_context.h"
 #include "crypto/openssl_errors.h"
 #include "crypto/openssl_use.h"
 #include "crypto/private_key_impl.h"
 #include "ssl/ssl_context_impl.h"
 #include "ssl/ssl_stream_impl.h"
+#include "ssl/tls_policy.h"
 
 #include <openssl/x509v3.h>
 
@@ -48,14 +50,15 @@ SSLContext::~SSLContext() = default;
 
 SSLContextImpl::SSLContextImpl() {
   Crypto::OpenSslUse::Prepare();
+  const Crypto::OpenSslUse use;
+  use.Require();
   const Crypto::OpenSslErrorScope errors;
-  m_native.reset(SSL_CTX_new(TLS_client_method()));
+  m_native.reset(SSL_CTX_new_ex(Crypto::GetLibraryContext(), nullptr, TLS_client_method()));
   if (!m_native) {
     errors.Throw("Cannot make an SSL context");
   }
   SSL_CTX *const native = m_native.get();
-  RequireSuccess(SSL_CTX_set_min_proto_version(native, TLS1_2_VERSION), errors, "Cannot require TLS 1.2");
-  SSL_CTX_set_options(native, SSL_OP_NO_RENEGOTIATION | SSL_OP_NO_COMPRESSION | SSL_OP_CLEANSE_PLAINTEXT);
+  ApplyTlsPolicy(native);
   // Only the intermediates that were given are shown, not whatever the trust store would add to them.
   SSL_CTX_set_mode(native, SSL_MODE_AUTO_RETRY | SSL_MODE_NO_AUTO_CHAIN);
   SSL_CTX_set_verify(native, SSL_VERIFY_PEER, nullptr);
@@ -79,6 +82,8 @@ SSLContextImpl::~SSLContextImpl() {
 
 // Not by OpenSSL's default paths: these can be bent by environment variables.
 void SSLContextImpl::TrustSystemStore() {
+  const Crypto::OpenSslUse use;
+  use.Require();
   const Crypto::OpenSslErrorScope errors;
   const char *const file = X509_get_default_cert_file();
   const char *const directory = X509_get_default_cert_dir();
@@ -90,7 +95,8 @@ void SSLContextImpl::TrustSystemStore() {
   m_sessions.Clear();
   X509_STORE *const store = SSL_CTX_get_cert_store(m_native.get());
   if (hasFile) {
-    RequireSuccess(X509_STORE_load_file(store, file), errors, "Cannot read the system trust store");
+    RequireSuccess(X509_STORE_load_file_ex(store, file, Crypto::GetLibraryContext(), nullptr), errors,
+                   "Cannot read the system trust store");
   }
   if (hasDirectory) {
     RequireSuccess(X509_STORE_load_path(store, directory), errors, "Cannot read the system trust store");
@@ -102,6 +108,8 @@ void SSLContextImpl::TrustFile(const std::string &path) {
 }
 
 void SSLContextImpl::TrustCertificates(const Crypto::CertificateList &certificates) {
+  const Crypto::OpenSslUse use;
+  use.Require();
   const Crypto::OpenSslErrorScope errors;
   m_sessions.Clear();
   X509_STORE *const store = SSL_CTX_get_cert_store(m_native.get());
@@ -114,6 +122,8 @@ void SSLContextImpl::SetClientCertificate(const Ref<const Crypto::Certificate> &
                                           const Ref<const Crypto::PrivateKey> &key,
                                           const Crypto::CertificateList &intermediates) {
   Crypto::RequireKeyMatchesCertificate(*key, *certificate);
+  const Crypto::OpenSslUse use;
+  use.Require();
   const Crypto::OpenSslErrorScope errors;
   m_sessions.Clear();
   SSL_CTX *const native = m_native.get();
@@ -128,6 +138,8 @@ void SSLContextImpl::SetClientCertificate(const Ref<const Crypto::Certificate> &
 }
 
 Ref<SSLStream> SSLContextImpl::CreateStream(const Ref<System::Stream> &stream, const std::string &endpoint) {
+  const Crypto::OpenSslUse use;
+  use.Require();
   return MakeRef<SSLStreamImpl>(Ref<SSLContextImpl>(this), stream, endpoint);
 }
 

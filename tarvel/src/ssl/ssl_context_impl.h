@@ -13,7 +13,7 @@ namespace Tarvel::Ssl {
 
 class SSLContextImpl final : public SSLContext {
 public:
-  /// @throws Crypto::CryptoException
+  /// @throws as `CreateSSLContext`.
   SSLContextImpl();
 
   void TrustSystemStore() override;
@@ -24,7 +24,7 @@ public:
   Ref<SSLStream> CreateStream(const Ref<System::Stream> &stream, const std::string &endpoint) override;
 
   /// A connection with this context's settings.
-  /// @throws SSLException; the message is the reason.
+  /// @throws SSLException; the message is the reason. @throws OutOfMemoryException
   ConnectionHandle CreateConnection() const;
 
   SessionCache &GetSessions() noexcept { return m_sessions; }

@@ -16,7 +16,9 @@
 #include <openssl/err.h>
 
 #include <algorithm>
+#include <cerrno>
 #include <mutex>
+#include <new>
 #include <utility>
 
 namespace Tarvel::Ssl {
@@ -114,6 +116,7 @@ SSLStreamImpl::SSLStreamImpl(const Ref<SSLContextImpl> &context, const Ref<Syste
     : m_context(context), m_lower(stream), m_endpoint(endpoint), m_host(endpoint) {}
 
 SSLStreamImpl::~SSLStreamImpl() {
+  m_endNotice.Withdraw();
   const Crypto::OpenSslUse use;
   if (!use) {
     Crypto::OpenSslUse::Abandon(m_connection.release());
@@ -187,7 +190,10 @@ void SSLStreamImpl::Close() noexcept {
   try {
     const System::Computation computing;
     auto done = std::make_shared<Completions>();
-    if (const Crypto::OpenSslUse use; use) {
+    if (const Crypto::OpenSslUse use; !use) {
+      const std::lock_guard<System::ForkSafeMutex> lock(m_mutex);
+      FailAfterOpenSsl(*done);
+    } else {
       const std::lock_guard<System::ForkSafeMutex> lock(m_mutex);
       const Crypto::OpenSslErrorScope errors;
       if (m_stage == Stage::ESTABLISHED && !m_lowerWrites) {
@@ -210,20 +216,52 @@ void SSLStreamImpl::Close() noexcept {
 
 // Always on an I/O thread: OpenSSL reports through the thread's error queue, and there it holds nothing of the host's.
 void SSLStreamImpl::PostPump() {
-  boost::asio::post(System::GetIoContext(), [self = Ref(this)] { self->PumpOnce(); });
+  boost::asio::post(System::GetIoContext(),
+                    [self = Ref(this)] { self->Advance([&self](Completions &done) { self->Pump(done); }); });
 }
 
-void SSLStreamImpl::PumpOnce() {
+template <typename Step>
+void SSLStreamImpl::Advance(const Step &step) {
   Completions done;
-  if (const Crypto::OpenSslUse use; use) {
+  {
+    const Crypto::OpenSslUse use;
     const std::lock_guard<System::ForkSafeMutex> lock(m_mutex);
-    Pump(done);
+    if (!use) {
+      FailAfterOpenSsl(done);
+    } else {
+      try {
+        step(done);
+      } catch (const OutOfMemoryException &) {
+        FailWith(m_noMemory, done);
+      } catch (const std::bad_alloc &) {
+        FailWith(m_noMemory, done);
+      } catch (const Exception &exception) {
+        Fail(exception.what(), done);
+      }
+    }
   }
   done.Run();
 }
 
+void SSLStreamImpl::OnOpenSslEnd(void *stream) noexcept {
+  try {
+    auto &self = *static_cast<SSLStreamImpl *>(stream);
+    auto done = std::make_shared<Completions>();
+    {
+      const std::lock_guard<System::ForkSafeMutex> lock(self.m_mutex);
+      self.FailAfterOpenSsl(*done);
+    }
+    if (!done->IsEmpty()) {
+      boost::asio::post(System::GetIoContext(), [done] { done->Run(); });
+    }
+  } catch (...) {
+    LogUncaughtException("the end of a TLS connection");
+  }
+}
+
 void SSLStreamImpl::Pump(Completions &done) {
   ERR_clear_error();
+  m_lacksMemory = false;
   if (m_stage == Stage::FRESH) {
     FailPending(std::make_shared<InvalidStateException>("The TLS handshake has not been started"), done);
     return;
@@ -271,13 +309,17 @@ void SSLStreamImpl::BeginHandshake(Completions &done) {
     Crypto::BioHandle received(BIO_new(BIO_s_mem()));
     Crypto::BioHandle toSend(BIO_new(BIO_s_mem()));
     if (!received || !toSend) {
-      throw SSLException(errors.Describe("no memory for the connection"));
+      throw OutOfMemoryException();
     }
     m_received = received.get();
     m_toSend = toSend.get();
     SSL_set_bio(connection.get(), received.release(), toSend.release());
     SSL_set_connect_state(connection.get());
-    SSL_set_app_data(connection.get(), this);
+    SSL_set_msg_callback(connection.get(), OnMessage);
+    SSL_set_msg_callback_arg(connection.get(), this);
+    if (SSL_set_app_data(connection.get(), this) != 1) {
+      throw OutOfMemoryException();
+    }
     m_identity->Apply(connection.get());
     m_sessionKey = m_endpoint + '\n' + m_identity->ToKey();
     if (const SessionHandle session = m_context->GetSessions().Take(m_sessionKey)) {
@@ -285,6 +327,8 @@ void SSLStreamImpl::BeginHandshake(Completions &done) {
     }
     m_lowerInput.resize(INPUT_BYTES);
     m_connection = std::move(connection);
+  } catch (const OutOfMemoryException &) {
+    FailWith(m_noMemory, done);
   } catch (const Exception &exception) {
     Fail(exception.what(), done);
   }
@@ -317,17 +361,33 @@ std::string SSLStreamImpl::RefuseServer() const {
   return {};
 }
 
-int SSLStreamImpl::OnVerifyServer(X509_STORE_CTX *verification, void *) noexcept {
-  try {
-    const auto *const connection =
-        static_cast<SSL *>(X509_STORE_CTX_get_ex_data(verification, SSL_get_ex_data_X509_STORE_CTX_idx()));
-    auto *const stream = static_cast<SSLStreamImpl *>(SSL_get_app_data(connection));
-    stream->m_verifyFailure = stream->VerifyServer(verification);
-    return stream->m_verifyFailure.empty() ? 1 : 0;
-  } catch (...) {
-    X509_STORE_CTX_set_error(verification, X509_V_ERR_OUT_OF_MEM);
-    return 0;
+// Before OpenSSL sends an alert, it resets the errno in which `malloc` has left the reason for it.
+void SSLStreamImpl::OnMessage(int, int, int, const void *, std::size_t, SSL *, void *stream) noexcept {
+  if (errno == ENOMEM) {
+    static_cast<SSLStreamImpl *>(stream)->m_lacksMemory = true;
   }
+}
+
+int SSLStreamImpl::OnVerifyServer(X509_STORE_CTX *verification, void *) noexcept {
+  const auto *const connection =
+      static_cast<SSL *>(X509_STORE_CTX_get_ex_data(verification, SSL_get_ex_data_X509_STORE_CTX_idx()));
+  auto *const stream = static_cast<SSLStreamImpl *>(SSL_get_app_data(connection));
+  // A certificate that was read without enough memory for all of it is refused for something else.
+  const bool lacksMemory = errno == ENOMEM;
+  try {
+    try {
+      stream->m_verifyFailure = stream->VerifyServer(verification);
+      stream->m_lacksMemory = lacksMemory && !stream->m_verifyFailure.empty();
+      return stream->m_verifyFailure.empty() ? 1 : 0;
+    } catch (const Crypto::CryptoException &exception) {
+      stream->m_verifyFailure = exception.what();
+      X509_STORE_CTX_set_error(verification, X509_V_ERR_UNSPECIFIED);
+    }
+  } catch (...) {
+    stream->m_lacksMemory = true;
+    X509_STORE_CTX_set_error(verification, X509_V_ERR_OUT_OF_MEM);
+  }
+  return 0;
 }
 
 /// Why the server's certificate is not accepted; empty when it is.
@@ -337,8 +397,13 @@ std::string SSLStreamImpl::VerifyServer(X509_STORE_CTX *verification) const {
     X509_STORE_CTX_set_error(verification, refusal.empty() ? X509_V_OK : X509_V_ERR_APPLICATION_VERIFICATION);
     return refusal;
   }
+  const Crypto::OpenSslErrorScope errors;
   if (X509_verify_cert(verification) == 1) {
     return {};
+  }
+  errors.RequireMemory();
+  if (X509_STORE_CTX_get_error(verification) == X509_V_ERR_OUT_OF_MEM) {
+    throw OutOfMemoryException();
   }
   return std::string("the server's certificate was not accepted: ") +
          X509_verify_cert_error_string(X509_STORE_CTX_get_error(verification)) + " (certificate \"" +
@@ -377,6 +442,11 @@ void SSLStreamImpl::EndConnection() noexcept {
 }
 
 void SSLStreamImpl::StepWrite(Completions &done) {
+  if (m_lowerWriteFailure) {
+    done.AddWrite(std::move(m_write->handler), 0, MakeFailure(*m_lowerWriteFailure));
+    m_write.reset();
+    return;
+  }
   const Crypto::OpenSslErrorScope errors;
   while (m_write->encrypted < m_write->length && BIO_ctrl_pending(m_toSend) < MAX_OUTPUT_BYTES) {
     std::size_t count = 0;
@@ -384,6 +454,7 @@ void SSLStreamImpl::StepWrite(Completions &done) {
                                     std::min(m_write->length - m_write->encrypted, RECORD_BYTES), &count);
     if (result != 1) {
       // Memory takes every byte, so OpenSSL has no reason to wait.
+      errors.RequireMemory();
       Fail(errors.Describe("the bytes cannot be encrypted"), done);
       return;
     }
@@ -408,15 +479,24 @@ bool SSLStreamImpl::StepRead(Completions &done) {
 }
 
 bool SSLStreamImpl::WaitsForBytes(int result, const Crypto::OpenSslErrorScope &errors, Completions &done) {
-  if (SSL_get_error(m_connection.get(), result) == SSL_ERROR_WANT_READ) {
+  const int error = SSL_get_error(m_connection.get(), result);
+  if (error == SSL_ERROR_WANT_READ) {
     if (!m_lowerEnded) {
       return true;
     }
     // Without this, whoever can cut the connection could shorten a message unnoticed (RFC 8446, section 6.1).
-    Fail("the server ended the connection without TLS's closing notice", done);
+    Fail(m_lowerWriteFailure.value_or("the server ended the connection without TLS's closing notice"), done);
     return false;
   }
   m_newSessions.clear(); // not to be resumed after a fatal alert (RFC 8446, section 6.2)
+  if (m_lacksMemory) {
+    throw OutOfMemoryException();
+  }
+  errors.RequireMemory();
+  if (error == SSL_ERROR_ZERO_RETURN) {
+    Fail("the server ended the connection", done);
+    return false;
+  }
   Fail(m_verifyFailure.empty() ? errors.TakeText() : m_verifyFailure, done);
   return false;
 }
@@ -429,12 +509,7 @@ void SSLStreamImpl::StartLowerRead() {
   m_lower->AsyncReadSome(
       m_lowerInput.data(), m_lowerInput.size(), [self = Ref(this)](std::size_t count, const Exception *exception) {
         auto proceed = [self, count, failure = exception ? LowerFailure(exception->what()) : LowerFailure()] {
-          Completions done;
-          if (const Crypto::OpenSslUse use; use) {
-            const std::lock_guard<System::ForkSafeMutex> lock(self->m_mutex);
-            self->OnLowerRead(count, failure, done);
-          }
-          done.Run();
+          self->Advance([&](Completions &done) { self->OnLowerRead(count, failure, done); });
         };
         const System::Computation computing;
         boost::asio::dispatch(System::GetIoContext(), std::move(proceed));
@@ -452,14 +527,17 @@ void SSLStreamImpl::OnLowerRead(std::size_t count, const LowerFailure &failure, 
   }
   m_lowerEnded = count == 0;
   if (count > 0 && BIO_write(m_received, m_lowerInput.data(), static_cast<int>(count)) != static_cast<int>(count)) {
-    Fail("no memory for what the server sends", done);
-    return;
+    throw OutOfMemoryException();
   }
   Pump(done);
 }
 
 void SSLStreamImpl::StartLowerWrite() {
   if (m_lowerWrites || !m_connection) {
+    return;
+  }
+  if (m_lowerWriteFailure) {
+    BIO_reset(m_toSend); // what OpenSSL answers to what it reads has nowhere to go
     return;
   }
   const std::size_t pending = std::min(BIO_ctrl_pending(m_toSend), 2 * MAX_OUTPUT_BYTES);
@@ -472,40 +550,49 @@ void SSLStreamImpl::StartLowerWrite() {
   m_lower->AsyncWrite(m_lowerOutput.data(), static_cast<std::size_t>(count),
                       [self = Ref(this)](std::size_t, const Exception *exception) {
                         auto proceed = [self, failure = exception ? LowerFailure(exception->what()) : LowerFailure()] {
-                          Completions done;
-                          if (const Crypto::OpenSslUse use; use) {
-                            const std::lock_guard<System::ForkSafeMutex> lock(self->m_mutex);
-                            self->OnLowerWritten(failure, done);
-                          }
-                          done.Run();
+                          self->Advance([&](Completions &done) { self->OnLowerWritten(failure, done); });
                         };
                         const System::Computation computing;
                         boost::asio::dispatch(System::GetIoContext(), std::move(proceed));
                       });
 }
 
+// A failure ends writing alone: a server that refuses a request may have sent an answer, or an alert, and said why.
 void SSLStreamImpl::OnLowerWritten(const LowerFailure &failure, Completions &done) {
   m_lowerWrites = false;
   if (m_stage == Stage::FAILED) {
     return;
   }
-  if (failure) {
-    Fail(*failure, done);
-    return;
-  }
+  m_lowerWriteFailure = failure;
   Pump(done);
 }
 
-void SSLStreamImpl::Fail(const std::string &reason, Completions &done) {
+SSLStreamImpl::Failure SSLStreamImpl::MakeFailure(const std::string &reason) const {
   const bool isEstablished = m_stage == Stage::ESTABLISHED;
-  if (isEstablished) {
+  return std::make_shared<SSLException>((isEstablished ? "The TLS connection to " : "The TLS handshake with ") +
+                                        m_host + (isEstablished ? " broke: " : " failed: ") +
+                                        (reason.empty() ? "OpenSSL gives no reason" : reason));
+}
+
+void SSLStreamImpl::Fail(const std::string &reason, Completions &done) {
+  FailWith(MakeFailure(reason), done);
+}
+
+void SSLStreamImpl::FailWith(Failure failure, Completions &done) {
+  if (m_stage == Stage::ESTABLISHED) {
     // Else OpenSSL takes the session for no longer resumable; what spoils a session, OpenSSL has noted by itself.
     SSL_set_shutdown(m_connection.get(), SSL_SENT_SHUTDOWN | SSL_RECEIVED_SHUTDOWN);
   }
-  m_failure = std::make_shared<SSLException>((isEstablished ? "The TLS connection to " : "The TLS handshake with ") +
-                                             m_host + (isEstablished ? " broke: " : " failed: ") +
-                                             (reason.empty() ? "for no reason that OpenSSL tells" : reason));
+  m_failure = std::move(failure);
   m_stage = Stage::FAILED;
+  FailPending(m_failure, done);
+}
+
+void SSLStreamImpl::FailAfterOpenSsl(Completions &done) {
+  if (m_stage != Stage::FAILED) {
+    m_failure = std::make_shared<InvalidStateException>(Crypto::OpenSslUse::ENDED);
+    m_stage = Stage::FAILED;
+  }
   FailPending(m_failure, done);
 }
 

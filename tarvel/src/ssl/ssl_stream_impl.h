@@ -5,6 +5,7 @@
 
 #pragma once
 
+#include "crypto/openssl_end.h"
 #include "crypto/openssl_errors.h"
 #include "ssl/server_identity.h"
 #include "ssl/ssl_context_impl.h"
@@ -33,6 +34,8 @@ public:
 
   /// For OpenSSL: asks whether the server's certificate is good (1) or not (0).
   static int OnVerifyServer(X509_STORE_CTX *verification, void *) noexcept;
+  /// For OpenSSL: shows each message, before it is sent.
+  static void OnMessage(int, int, int, const void *, std::size_t, SSL *, void *stream) noexcept;
   /// For OpenSSL: offers a session for keeping; 1 when its reference was taken over.
   static int OnNewSession(SSL *connection, SSL_SESSION *session) noexcept;
 
@@ -70,7 +73,11 @@ private:
   bool IsOfParent() const noexcept { return m_generation != System::GetForkGeneration(); }
 
   void PostPump();
-  void PumpOnce();
+  /// Takes `step` under the lock, or fails what is pending once OpenSSL is gone; then calls the handlers.
+  template <typename Step>
+  void Advance(const Step &step);
+  /// For the end of OpenSSL. Nobody would wake a read that waits for a server that is silent.
+  static void OnOpenSslEnd(void *stream) noexcept;
 
   // All that follows is called under the lock. The steps say whether they wait for bytes from below.
   void Pump(Completions &done);
@@ -92,14 +99,18 @@ private:
 
   /// Whether OpenSSL, whose call gave `result`, waits for bytes. If not, the stream has failed.
   bool WaitsForBytes(int result, const Crypto::OpenSslErrorScope &errors, Completions &done);
-  /// Ends the stream for good: what is pending, and what comes, fails.
+  /// Each of these ends the stream for good: what is pending, and what comes, fails.
   void Fail(const std::string &reason, Completions &done);
+  void FailWith(Failure failure, Completions &done);
+  void FailAfterOpenSsl(Completions &done);
+  Failure MakeFailure(const std::string &reason) const;
   void FailPending(const Failure &failure, Completions &done);
 
   const unsigned m_generation = System::GetForkGeneration();
   const Ref<SSLContextImpl> m_context;
   const Ref<System::Stream> m_lower;
   const std::string m_endpoint;
+  const Failure m_noMemory = std::make_shared<OutOfMemoryException>();
   std::atomic<bool> m_wasResumed{false};
 
   System::ForkSafeMutex m_mutex; // guards all that follows; never held while a handler runs
@@ -110,6 +121,7 @@ private:
   std::optional<ServerIdentity> m_identity;
   std::string m_sessionKey;
   std::string m_verifyFailure;
+  bool m_lacksMemory = false; // as far as it has been noticed within OpenSSL
 
   ConnectionHandle m_connection; // used on the I/O threads alone, but for its end
   // The oldest first. Not to be seen by others yet: the connection copies and changes its sessions, and takes no lock.
@@ -124,8 +136,11 @@ private:
   bool m_lowerReads = false;
   bool m_lowerWrites = false;
   bool m_lowerEnded = false;
+  LowerFailure m_lowerWriteFailure; // since which nothing can be written
   std::vector<char> m_lowerInput;
   std::vector<char> m_lowerOutput;
+
+  Crypto::OpenSslEndNotice m_endNotice{OnOpenSslEnd, this}; // the last: all else must be there when it comes
 };
 
 } // namespace Tarvel::Ssl

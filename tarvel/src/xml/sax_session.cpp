@@ -11,10 +11,10 @@
 #include <libxml/xmlerror.h>
 
 #include <algorithm>
+#include <cerrno>
 #include <cstring>
 #include <functional>
 #include <mutex>
-#include <new>
 
 namespace Tarvel {
 namespace Xml {
@@ -55,10 +55,12 @@ std::string GetDetail(const xmlError &error) {
   return StringUtil::Shorten(detail);
 }
 
-/// Gives a host that uses libxml2 itself its thread's last error back, which each of our errors would replace.
+/// Gives a host that uses libxml2 itself its thread's last error back, which each of our errors would replace. Meanwhile
+/// nothing is written to standard error, as errors are that belong to no parser.
 class LastErrorKeeper {
 public:
-  LastErrorKeeper() {
+  LastErrorKeeper() : m_handler(xmlStructuredError), m_context(xmlStructuredErrorContext) {
+    xmlSetStructuredErrorFunc(nullptr, [](void *, xmlErrorPtr) {});
     if (const xmlError *const last = xmlGetLastError()) {
       xmlCopyError(const_cast<xmlError *>(last), &m_kept);
     }
@@ -67,6 +69,7 @@ public:
   LastErrorKeeper &operator=(const LastErrorKeeper &) = delete;
 
   ~LastErrorKeeper() {
+    xmlSetStructuredErrorFunc(m_context, m_handler);
     xmlResetLastError();
     if (m_kept.code != XML_ERR_OK) {
       xmlCopyError(&m_kept, &xmlLastError);
@@ -75,6 +78,8 @@ public:
   }
 
 private:
+  const xmlStructuredErrorFunc m_handler;
+  void *const m_context;
   xmlError m_kept{};
 };
 
@@ -164,7 +169,7 @@ struct SaxSession::Callbacks {
 struct SaxSession::Context {
   explicit Context(SaxSession &session) : parser(xmlNewParserCtxt()) {
     if (!parser) {
-      throw std::bad_alloc();
+      throw OutOfMemoryException();
     }
     session.m_parser = parser;
     *parser->sax = Callbacks::GetTable();
@@ -176,7 +181,7 @@ struct SaxSession::Context {
     if (!input || inputPush(parser, input) < 0) {
       xmlFreeInputStream(input);
       xmlFreeParserCtxt(parser);
-      throw std::bad_alloc();
+      throw OutOfMemoryException();
     }
   }
   Context(const Context &) = delete;
@@ -193,12 +198,14 @@ void SaxSession::Run() {
   static std::once_flag initialised;
   std::call_once(initialised, [] { xmlInitParser(); });
   const System::Computation computing; // libxml2 has locks of its own
+  errno = 0;
   const LastErrorKeeper lastError;
   const Context context(*this);
   xmlParseDocument(context.parser);
   if (m_failure) {
     std::rethrow_exception(m_failure);
   }
+  RequireMemory(context.parser->errNo);
   if (!context.parser->wellFormed) { // without having said why
     throw XMLParseException("the document is not well-formed", 1, 1);
   }
@@ -274,8 +281,17 @@ void SaxSession::ReadStartTag(std::size_t begin, std::size_t end, const xmlChar 
   }
 }
 
+// Where libxml2 lacks memory it may report something else, such as a namespace name that is no URI, or nothing at all. But then
+// `malloc` has set errno, which `Run` has reset and nothing in the parser changes.
+void SaxSession::RequireMemory(int errorCode) {
+  if (errorCode == XML_ERR_NO_MEMORY || errno == ENOMEM) {
+    throw OutOfMemoryException();
+  }
+}
+
 void SaxSession::TakeError(const xmlError &error) {
   if (error.level < XML_ERR_ERROR) {
+    RequireMemory(error.code);
     return;
   }
   if (error.code == XML_NS_ERR_UNDEFINED_NAMESPACE) {
@@ -285,9 +301,7 @@ void SaxSession::TakeError(const xmlError &error) {
     }
     return;
   }
-  if (error.code == XML_ERR_NO_MEMORY) {
-    throw std::bad_alloc();
-  }
+  RequireMemory(error.code);
   Refuse(GetDetail(error), GetOffset());
 }
 

@@ -39,6 +39,7 @@ private:
   void EndElement();
   void ReadStartTag(std::size_t begin, std::size_t end, const xmlChar *const *namespaces, std::size_t namespaceCount,
                     const xmlChar *const *attributes, std::size_t attributeCount);
+  static void RequireMemory(int errorCode);
   void TakeError(const xmlError &error);
 
   /// Where the parser stands.

@@ -24,11 +24,12 @@ END
 
 # certificate NAME ISSUER EXTENSIONS [START END]: NAME.key and NAME.crt with the subject CN=NAME, signed by ISSUER's key (its own
 # when it is NAME), 2020 to 2120 unless said otherwise. `openssl x509` takes no dates before OpenSSL 3.4, so `openssl ca`.
+# A NAME.key that is there already is kept.
 certificate() {
   local name=$1 issuer=$2 extensions=$3 start=${4:-20200102030405Z} end=${5:-21200102030405Z} signer
   [ ! -f "$name.crt" ] || return 0
   echo "making $name"
-  openssl genpkey -algorithm EC -pkeyopt ec_paramgen_curve:P-256 -out "$name.key"
+  [ -f "$name.key" ] || openssl genpkey -algorithm EC -pkeyopt ec_paramgen_curve:P-256 -out "$name.key"
   openssl req -new -key "$name.key" -subj "/CN=$name" -out "$work/request"
   printf '%b\n' "$extensions" >"$work/extensions"
   signer=(-keyfile "$issuer.key" -cert "$issuer.crt")
@@ -46,6 +47,11 @@ certificate unknown-authority unknown-authority "$authority"
 certificate intermediate authority "$authority"
 
 certificate localhost authority "$server\n$here"
+for bits in 1024 2048; do
+  [ -f "localhost-rsa$bits.key" ] || openssl genpkey -quiet -algorithm RSA -pkeyopt "rsa_keygen_bits:$bits" \
+    -out "localhost-rsa$bits.key"
+  certificate "localhost-rsa$bits" authority "$server\n$here"
+done
 certificate other-host authority "$server\nsubjectAltName=DNS:other.example"
 certificate expired authority "$server\n$here" 20200102030405Z 20210102030405Z
 certificate not-yet-valid authority "$server\n$here" 21100102030405Z 21200102030405Z

@@ -155,7 +155,7 @@ Outcome AskWith(long allocations, const char *answer, const Exception *connectFa
     EXPECT_NE(failure == nullptr, response == nullptr);
     outcome.succeeded = response != nullptr;
     outcome.ranOutOfMemory = dynamic_cast<const Tarvel::OutOfMemoryException *>(failure) != nullptr ||
-                             (failure && std::strcmp(failure->what(), "Out of memory") == 0);
+                             (failure && std::strcmp(failure->what(), "There is not enough memory") == 0);
   };
   Ref<ScheduledItem> item;
   t_hasFailed = false;

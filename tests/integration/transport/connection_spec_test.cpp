@@ -159,7 +159,7 @@ TEST(SsoConnectionSpec, CallsItsCompletionForWhateverIsThrownBetweenConnectAndHa
     std::function<void()> raise;
     std::string failure;
   };
-  for (const Case &thrown : {Case{[] { throw std::bad_alloc(); }, "Out of memory"},
+  for (const Case &thrown : {Case{[] { throw std::bad_alloc(); }, "There is not enough memory"},
                              Case{[] { throw std::runtime_error("foreign"); }, foreign + "foreign"},
                              Case{[] { throw 42; }, foreign + "an object that is not an exception was thrown"},
                              Case{[] { throw Tarvel::Ssl::SSLException("of the platform"); }, "of the platform"}}) {

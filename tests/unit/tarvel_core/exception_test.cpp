@@ -131,6 +131,18 @@ class Fruit : public Object {};
 class Apple final : public Fruit {};
 class Pear final : public Fruit {};
 
+TEST(OutOfMemoryException, HasOneMessageAndNoCallStack) {
+  const OutOfMemoryException failure;
+  const Exception &base = failure;
+  EXPECT_STREQ(base.what(), "There is not enough memory");
+  EXPECT_EQ(base.GetBacktrace(), "");
+  EXPECT_EQ(base.Where(), "");
+  EXPECT_EQ(base.Dump(), "Tarvel::OutOfMemoryException: There is not enough memory\n");
+  const std::unique_ptr<const Exception> copy(base.Clone());
+  EXPECT_STREQ(copy->what(), "There is not enough memory");
+  EXPECT_THROW(copy->Throw(), OutOfMemoryException);
+}
+
 TEST(CheckedCast, GivesTheSameObjectAsItsClass) {
   const Ref<Object> object = MakeRef<Apple>();
   EXPECT_EQ(CheckedCast<Apple>(object).get(), object.get());

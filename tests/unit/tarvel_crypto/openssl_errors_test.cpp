@@ -2,12 +2,16 @@
 
 #include "crypto/openssl_errors.h"
 
+#include "support/throws_message.h"
+
 #include <tarvel/crypto/certificate.h>
 
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
 
 #include <openssl/err.h>
+
+#include <cerrno>
 
 namespace Tarvel::Crypto {
 
@@ -88,6 +92,52 @@ TEST_F(OpenSslErrorScopeTest, HasNoTextWhenOnlyTheHostHasAnError) {
   RaiseError(1, "of the host");
   const OpenSslErrorScope errors;
   EXPECT_EQ(errors.Describe("It failed"), "It failed");
+}
+
+TEST_F(OpenSslErrorScopeTest, KnowsALackOfMemoryByAnyErrorOfTheQueue) {
+  const OpenSslErrorScope errors;
+  ERR_raise(ERR_LIB_ASN1, ERR_R_MALLOC_FAILURE);
+  RaiseError(1, "and so it does not decode");
+  EXPECT_THROWS_MESSAGE(errors.Throw("It failed"), OutOfMemoryException, "There is not enough memory");
+}
+
+TEST_F(OpenSslErrorScopeTest, KnowsALackOfMemoryByTheSystemWhenOpenSslReportsSomethingElse) {
+  errno = ENOMEM; // of the host
+  const OpenSslErrorScope errors;
+  RaiseError(1, "it does not decode");
+  EXPECT_FALSE(errors.RanOutOfMemory());
+  errno = ENOMEM;
+  EXPECT_THROWS_MESSAGE(errors.Describe("It failed"), OutOfMemoryException, "There is not enough memory");
+}
+
+TEST_F(OpenSslErrorScopeTest, KnowsALackOfMemoryOfAScopeWithinIt) {
+  const OpenSslErrorScope errors;
+  {
+    const OpenSslErrorScope inner;
+    errno = ENOMEM;
+  }
+  {
+    const OpenSslErrorScope inner;
+    EXPECT_FALSE(inner.RanOutOfMemory());
+  }
+  EXPECT_TRUE(errors.RanOutOfMemory());
+}
+
+TEST_F(OpenSslErrorScopeTest, KeepsTheSystemsErrorOfTheHost) {
+  errno = EAGAIN;
+  {
+    const OpenSslErrorScope errors;
+    errno = EBADF;
+  }
+  EXPECT_EQ(errno, EAGAIN);
+}
+
+TEST_F(OpenSslErrorScopeTest, HasItsTextAlsoAfterMemoryWasAskedFor) {
+  const OpenSslErrorScope errors;
+  RaiseError(1, "ours");
+  EXPECT_FALSE(errors.RanOutOfMemory());
+  EXPECT_EQ(ERR_GET_REASON(errors.PeekNewest()), 1);
+  EXPECT_THAT(errors.Describe("It failed"), HasSubstr("ours"));
 }
 
 } // namespace

@@ -3,9 +3,12 @@
 
 #include "crypto/openssl_use.h"
 
+#include "crypto/passphrase.h"
 #include "crypto/public_key.h"
 #include "fixtures.h"
 #include "support/process_resources.h"
+
+#include <tarvel/crypto/system_configuration.h>
 
 #include <gtest/gtest.h>
 #include <openssl/crypto.h>
@@ -44,6 +47,8 @@ public:
                  value.size());
   }
 
+  void RequireMatch() const { RequireKeyMatchesCertificate(*m_key, *m_certificate); }
+
   const Certificate &GetCertificate() const { return *m_certificate; }
 
 private:
@@ -59,7 +64,7 @@ void EndWhileBusy() {
       for (;; ++rounds) {
         try {
           work->Run();
-        } catch (const CryptoException &) {
+        } catch (const InvalidStateException &) {
           // The process is ending.
         }
       }
@@ -80,12 +85,13 @@ void ReportRefusal(const char *name, const std::function<void()> &use) {
   try {
     use();
     std::cerr << name << " went on\n";
-  } catch (const CryptoException &refusal) {
+  } catch (const InvalidStateException &refusal) {
     std::cerr << name << ": " << refusal.what() << "\n";
   }
 }
 
 void UseAfterCleanUp() {
+  UseSystemConfiguration();
   auto work = std::make_unique<const TokenWork>();
   work->Run();
   OPENSSL_cleanup();
@@ -95,15 +101,59 @@ void UseAfterCleanUp() {
   ReportRefusal("write", [&] { static_cast<void>(work->GetCertificate().ToPem()); });
   ReportRefusal("sign", [&] { work->Run(); });
   ReportRefusal("verify", [&] { work->Verify(work->GetCertificate(), std::vector<std::uint8_t>(256)); });
+  ReportRefusal("PEM", [] { CreatePrivateKey(Testing::ReadFixture("rsa2048.key")); });
+  ReportRefusal("DER", [] { CreatePrivateKey(Testing::ReadFixture("rsa2048.key.der")); });
+  ReportRefusal("PKCS#12", [] { CreateKeyStoreFromPkcs12(Testing::ReadFixture("p256.p12"), {}); });
+  ReportRefusal("URI", [] { LoadPrivateKey("file:nowhere"); });
+  ReportRefusal("match", [&] { work->RequireMatch(); });
+  ReportRefusal("system configuration", [] { UseSystemConfiguration(); });
   work.reset(); // nothing is freed
   std::_Exit(0);
+}
+
+TEST(Passphrase, IsAskedForInAPauseOfTheUse) {
+  OpenSslUse::Prepare();
+  OpenSslUse use;
+  const PassphraseCallback ask = [&use] {
+    EXPECT_FALSE(use); // so that nobody waits for who types
+    return std::string("x");
+  };
+  Passphrase passphrase(ask, use);
+  EXPECT_EQ(passphrase.Get(), "x");
+  EXPECT_TRUE(use);
+}
+
+TEST(Passphrase, IsFollowedByTheUseAlsoWhenTheHostThrows) {
+  OpenSslUse::Prepare();
+  OpenSslUse use;
+  const PassphraseCallback ask = []() -> std::string { throw InvalidArgumentException("no"); };
+  Passphrase passphrase(ask, use);
+  EXPECT_THROW(passphrase.Get(), InvalidArgumentException);
+  EXPECT_TRUE(use);
+}
+
+void CleanUpWhileThePassphraseIsAskedFor() {
+  ReportRefusal("key", [] {
+    CreatePrivateKey(Testing::ReadFixture("p256-encrypted.key"), [] {
+      OPENSSL_cleanup(); // which would wait for a use that was going on
+      return Testing::PASSPHRASE;
+    });
+  });
+  std::_Exit(0);
+}
+
+TEST(OpenSslUseDeathTest, IsRefusedWhenOpenSslCleanedItselfUpWhileThePassphraseWasAskedFor) {
+  testing::FLAGS_gtest_death_test_style = "threadsafe";
+  EXPECT_EXIT(CleanUpWhileThePassphraseIsAskedFor(), testing::ExitedWithCode(0),
+              "^key: OpenSSL has cleaned itself up: the process is about to end\n$");
 }
 
 TEST(OpenSslUseDeathTest, IsRefusedOnceOpenSslHasCleanedItselfUp) {
   testing::FLAGS_gtest_death_test_style = "threadsafe";
   const char *const reason = ": OpenSSL has cleaned itself up: the process is about to end\n";
   std::string expected = "^";
-  for (const char *const name : {"read", "digest", "subject", "write", "sign", "verify"}) {
+  for (const char *const name : {"read", "digest", "subject", "write", "sign", "verify", "PEM", "DER", "PKCS#12", "URI",
+                                 "match", "system configuration"}) {
     expected.append(name).append(reason);
   }
   EXPECT_EXIT(UseAfterCleanUp(), testing::ExitedWithCode(0), expected + "$");

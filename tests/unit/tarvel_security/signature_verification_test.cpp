@@ -94,6 +94,20 @@ INSTANTIATE_TEST_SUITE_P(Verify, VerifyFixture, ::testing::ValuesIn(SIGNED_FIXTU
   return name;
 });
 
+TEST(Verify, RefusesRsaKeysWithoutASoundExponent) {
+  const std::string text = ReadDataFile("tokens/rsa-sha256.xml");
+  const std::size_t begin = text.find("<ds:SignatureValue>") + 19;
+  const std::string genuine = text.substr(begin, text.find('<', begin) - begin);
+  const std::string forged = Replaced(text, genuine, ReadDataFile("tokens/sts-rsa-e1.forged-value"));
+  const std::string refusal = "No trusted key can be used with the signature algorithm "
+                              "\"http://www.w3.org/2001/04/xmldsig-more#rsa-sha256\"";
+  for (const char *const certificate : {"sts-rsa-e1", "sts-rsa-e2"}) {
+    EXPECT_THROWS_MESSAGE(VerifyText(forged, {certificate}), XmlSecurityException, refusal) << certificate;
+  }
+  EXPECT_FALSE(VerifyText(forged, {"sts-rsa-e3"}));
+  EXPECT_FALSE(VerifyText(forged, {"sts-rsa-e1", "sts-rsa"}));
+}
+
 const std::string EXCLUSIVE_TRANSFORM = R"(<ds:Transform Algorithm="http://www.w3.org/2001/10/xml-exc-c14n#"/>)";
 
 std::string GoodToken() {

@@ -3,14 +3,18 @@
 #include "unit/tarvel_ssl/tls_client.h"
 
 #include "support/process_resources.h"
+#include "system/io_engine.h"
 
 #include <tarvel/core/exception.h>
+
+#include <boost/asio/post.hpp>
 
 #include <gtest/gtest.h>
 
 #include <openssl/err.h>
 #include <openssl/ssl.h>
 
+#include <atomic>
 #include <cstdlib>
 #include <future>
 #include <string>
@@ -189,6 +193,144 @@ TEST(SSLStream, ReportsAnEndWithinTheHandshake) {
   EXPECT_EQ(client.ShakeHands(),
             "The TLS handshake with localhost failed: the server ended the connection without TLS's "
             "closing notice");
+}
+
+TEST(SSLStream, ReportsAnOrderlyEndWithinTheHandshake) {
+  ScriptedServer server([](ServerConnection &connection) {
+    connection.ReadRawSome();
+    connection.WriteRaw(std::string("\x15\x03\x03\x00\x02\x01\x00", 7)); // TLS's closing notice
+    connection.Stall();
+  });
+  TlsClient client(CreateTrustingContext(), server.GetPort());
+  EXPECT_EQ(client.ShakeHands(), "The TLS handshake with localhost failed: the server ended the connection");
+}
+
+/// A stream over TCP whose writes fail once they are told to, as when the server has reset the connection.
+class BrokenWriter final : public System::Stream {
+public:
+  explicit BrokenWriter(const Ref<System::Stream> &inner) : m_inner(inner) {}
+
+  void Break() { m_isBroken = true; }
+
+  void AsyncReadSome(char *buffer, std::size_t length, TransferHandler handler) override {
+    m_inner->AsyncReadSome(buffer, length, std::move(handler));
+  }
+  void AsyncWrite(const char *bytes, std::size_t length, TransferHandler handler) override {
+    if (!m_isBroken) {
+      m_inner->AsyncWrite(bytes, length, std::move(handler));
+      return;
+    }
+    boost::asio::post(System::GetIoContext(), [handler = std::move(handler)] {
+      const System::NetworkException failure("Broken pipe");
+      handler(0, &failure);
+    });
+  }
+  void Close() noexcept override { m_inner->Close(); }
+
+private:
+  const Ref<System::Stream> m_inner;
+  std::atomic<bool> m_isBroken{false};
+};
+
+/// A TLS connection to a server that may go on once writing is broken.
+class BrokenConnection {
+public:
+  BrokenConnection(int port, bool beforeTheHandshake) {
+    const auto socket = System::CreateTcpClientSocket();
+    Completion connected;
+    socket->AsyncConnect("127.0.0.1", port, connected.ForEnd());
+    EXPECT_EQ(connected.GetMessage(), "");
+    const auto lower = MakeRef<BrokenWriter>(socket);
+    m_context = CreateTrustingContext();
+    stream = m_context->CreateStream(lower, "localhost");
+    if (beforeTheHandshake) {
+      lower->Break();
+    }
+    stream->AsyncHandshake("localhost", "", handshake.ForEnd());
+    EXPECT_TRUE(handshake.Wait());
+    lower->Break();
+  }
+
+  std::string Write(const std::string &bytes) const {
+    Completion written;
+    stream->AsyncWrite(bytes.data(), bytes.size(), written.ForTransfer());
+    return written.GetMessage();
+  }
+  std::string Read() const {
+    std::string bytes(100, '\0');
+    Completion read;
+    stream->AsyncReadSome(bytes.data(), bytes.size(), read.ForTransfer());
+    const std::string failure = read.GetMessage();
+    return failure.empty() ? bytes.substr(0, read.GetCount()) : failure;
+  }
+
+  Ref<SSLStream> stream;
+  Completion handshake;
+
+private:
+  Ref<SSLContext> m_context;
+};
+
+TEST(SSLStream, ReadsWhatTheServerSentAfterAWriteHasFailed) {
+  std::promise<void> failed;
+  ScriptedServer server(
+      [future = failed.get_future().share()](ServerConnection &connection) {
+        connection.ShakeHands();
+        future.wait_for(PATIENCE);
+        connection.Write("413");
+      },
+      TlsSettings());
+  const BrokenConnection client(server.GetPort(), false);
+  const std::string broken = "The TLS connection to localhost broke: Broken pipe";
+  EXPECT_EQ(client.Write("request"), broken);
+  EXPECT_EQ(client.Write("again"), broken);
+  failed.set_value();
+  EXPECT_EQ(client.Read(), "413");
+  EXPECT_EQ(client.Read(), "");
+}
+
+TEST(SSLStream, ReportsTheFailedWriteWhenTheServerEndsWithoutNotice) {
+  std::promise<void> failed;
+  ScriptedServer server(
+      [future = failed.get_future().share()](ServerConnection &connection) {
+        connection.ShakeHands();
+        future.wait_for(PATIENCE);
+        connection.CloseWithoutNotice();
+      },
+      TlsSettings());
+  const BrokenConnection client(server.GetPort(), false);
+  const std::string broken = "The TLS connection to localhost broke: Broken pipe";
+  EXPECT_EQ(client.Write("request"), broken);
+  failed.set_value();
+  EXPECT_EQ(client.Read(), broken);
+}
+
+TEST(SSLStream, ReportsTheAlertOfAHandshakeInWhichNothingCanBeWritten) {
+  ScriptedServer server([](ServerConnection &connection) {
+    connection.WriteRaw(std::string("\x15\x03\x03\x00\x02\x02\x28", 7)); // fatal, handshake failure
+    connection.Stall();
+  });
+  const BrokenConnection client(server.GetPort(), true);
+  EXPECT_EQ(client.handshake.GetMessage(), "The TLS handshake with localhost failed: error:0A000410:SSL routines::"
+                                           "sslv3 alert handshake failure (SSL alert number 40)");
+}
+
+TEST(SSLStream, ReportsTheFailedWriteOfAHandshakeThatTheServerEnds) {
+  ScriptedServer server([](ServerConnection &connection) { connection.CloseWithoutNotice(); });
+  const BrokenConnection client(server.GetPort(), true);
+  EXPECT_EQ(client.handshake.GetMessage(), "The TLS handshake with localhost failed: Broken pipe");
+}
+
+TEST(SSLStream, ReportsThatACertificateIsRequired) {
+  TlsSettings settings;
+  settings.demandsClient = true;
+  settings.minimumVersion = TLS1_3_VERSION;
+  ScriptedServer server([](ServerConnection &connection) { connection.ShakeHands(); }, settings);
+  const BrokenConnection client(server.GetPort(), false);
+  EXPECT_EQ(client.handshake.GetMessage(), "");
+  EXPECT_EQ(client.Write("request"), "The TLS connection to localhost broke: Broken pipe");
+  EXPECT_EQ(client.Read(), "The TLS connection to localhost broke: error:0A00045C:SSL routines::"
+                           "tlsv13 alert certificate required (SSL alert number 116)");
 }
 
 TEST(SSLStream, ReportsAServerThatDoesNotSpeakTls) {

@@ -38,9 +38,13 @@ public:
   /// Raises a copy as its own dynamic class, so that a holder of a base reference rethrows the precise type.
   [[noreturn]] virtual void Throw() const;
 
+protected:
+  /// Without message and call stack, and so without memory: for a class that has a `what` of its own.
+  Exception() noexcept;
+
 private:
   struct State;
-  std::shared_ptr<const State> m_state;
+  std::shared_ptr<const State> m_state; // null when there was no memory for it
 };
 
 /// Adds what every exception class needs (`Clone` and `Throw` of its own dynamic class) to a class body.
@@ -74,14 +78,10 @@ public:
   [[noreturn]] void Throw() const override;
 };
 
-/// An operation on an object that is not in the state for it.
+/// An operation on an object that is not in the state for it. Also whatever needs OpenSSL once it has cleaned itself up, with
+/// the message "OpenSSL has cleaned itself up: the process is about to end": that is no verdict on anything, either.
 class TARVEL_API InvalidStateException : public Exception {
   TARVEL_EXCEPTION_BODY(InvalidStateException, Exception);
-};
-
-/// Memory that ran out.
-class TARVEL_API OutOfMemoryException : public Exception {
-  TARVEL_EXCEPTION_BODY(OutOfMemoryException, Exception);
 };
 
 /// An object that is not of the class that is asked for.
@@ -97,6 +97,20 @@ class TARVEL_API Base64FormatException : public Exception {
 /// Text that is not a date-time of the xsd:dateTime form, or one that is out of range.
 class TARVEL_API DateTimeFormatException : public Exception {
   TARVEL_EXCEPTION_BODY(DateTimeFormatException, Exception);
+};
+
+/// Memory that ran out in a library that this one rests on (OpenSSL, libxml2); any function that uses one of them may raise
+/// it. It says nothing about what was being read, verified or sent. The message is always "There is not enough memory";
+/// there is no call stack. (Memory that runs out elsewhere raises `std::bad_alloc`.)
+class TARVEL_API OutOfMemoryException : public Exception {
+public:
+  OutOfMemoryException() noexcept = default;
+  OutOfMemoryException(const OutOfMemoryException &) noexcept = default;
+  OutOfMemoryException &operator=(const OutOfMemoryException &) noexcept = default;
+  ~OutOfMemoryException() override;
+  const char *what() const noexcept override;
+  OutOfMemoryException *Clone() const override;
+  [[noreturn]] void Throw() const override;
 };
 
 /// A file or stream that cannot be read or written; the message names it and the system's reason.

@@ -19,7 +19,9 @@ namespace Tarvel {
 namespace Crypto {
 
 /// Something wrong with a certificate, a key or a file that holds them; the message says what and where, with the
-/// cryptographic library's own words.
+/// cryptographic library's own words. All that uses that library can also raise two exceptions that say nothing about what it
+/// was given: `InvalidStateException` when the library has cleaned itself up because the process ends, and
+/// `OutOfMemoryException`.
 class TARVEL_API CryptoException : public Exception {
   TARVEL_EXCEPTION_BODY(CryptoException, Exception);
 };

@@ -43,7 +43,8 @@ protected:
   ~PrivateKey() override;
 };
 
-/// Asked for the passphrase of an encrypted key, on the calling thread, at most once a call; the text is wiped after use.
+/// Asked for the passphrase of an encrypted key, on the calling thread, at most once a call; the text is wiped after use. It
+/// may take its time.
 /// An empty function means that there is none.
 using PassphraseCallback = std::function<std::string()>;
 
@@ -52,8 +53,8 @@ using PassphraseCallback = std::function<std::string()>;
 /// missing or wrong. @throws CryptoException when it does not decode, or is neither RSA nor EC.
 TARVEL_API Ref<const PrivateKey> CreatePrivateKey(std::string_view text, const PassphraseCallback &passphrase = {});
 
-/// The private key in a file, or in the store that an URI names (as "pkcs11:…", through the cryptographic library's
-/// loaders).
+/// The private key in a file, or in the store that an URI names ("file:…"; after `UseSystemConfiguration` also what the
+/// machine's providers load, such as "pkcs11:…").
 /// @throws IOException when a file cannot be read; else as `CreatePrivateKey`, the message beginning with the path.
 TARVEL_API Ref<const PrivateKey> LoadPrivateKey(const std::string &pathOrUri,
                                                 const PassphraseCallback &passphrase = {});

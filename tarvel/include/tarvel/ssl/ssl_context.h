@@ -26,8 +26,9 @@ class TARVEL_API SSLException : public System::NetworkException {
 class TARVEL_API SSLStream : public System::Stream {
 public:
   /// Called once, on an I/O thread, with null or with what went wrong, which is valid during the call: an
-  /// `SSLException`, also when the stream below failed, or an `InvalidStateException` for a second handshake. As any
-  /// completion of a stream, it must not block, nor wait for another operation: start the next one from it.
+  /// `SSLException`, also when the stream below failed; an `InvalidStateException` for a second handshake, and when OpenSSL has
+  /// cleaned itself up because the process ends; an `OutOfMemoryException`, which says nothing about the server. As
+  /// any completion of a stream, it must not block, nor wait for another operation: start the next one from it.
   using HandshakeHandler = std::function<void(const Exception *)>;
 
   /// Shakes hands as a client. `host` is sent as the server name (unless it is an address) and the server's certificate
@@ -43,8 +44,12 @@ protected:
   ~SSLStream() override;
 };
 
-/// Settings and session memory for TLS connections: TLS 1.2 or later, peer and host name always verified. Set it up on
-/// one thread, then use it on any; not to be changed while in use.
+/// Settings and session memory for TLS connections: TLS 1.2 or later, cipher suites with forward secrecy alone, keys of at least
+/// 112 bits of security, peer and host name always verified. No configuration of OpenSSL changes that, and
+/// `Crypto::UseSystemConfiguration` can only narrow it. Set it up on one thread, then use it on any; not to be changed while
+/// in use.
+///
+/// Each function also throws `InvalidStateException` when OpenSSL has cleaned itself up, and `OutOfMemoryException`.
 class TARVEL_API SSLContext : public Object {
 public:
   /// Adds the system's trust store. @throws Crypto::CryptoException
@@ -68,7 +73,8 @@ protected:
   ~SSLContext() override;
 };
 
-/// A context that trusts nothing yet. @throws Crypto::CryptoException
+/// A context that trusts nothing yet.
+/// @throws Crypto::CryptoException, InvalidStateException when OpenSSL has cleaned itself up, OutOfMemoryException
 TARVEL_API Ref<SSLContext> CreateSSLContext();
 
 } // namespace Ssl

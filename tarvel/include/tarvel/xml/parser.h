@@ -51,7 +51,7 @@ class TARVEL_API XMLParser : public Object {
 public:
   /// Reads `reader` to its end and returns what the handler made of the document.
   /// @throws XMLParseException as that class says; the handler then yields nothing.
-  /// @throws IOException when the reader fails.
+  /// @throws IOException when the reader fails. @throws OutOfMemoryException, which says nothing about the document.
   virtual Ref<Object> Parse(Reader &reader) = 0;
 
 protected:

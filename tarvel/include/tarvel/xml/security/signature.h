@@ -54,6 +54,7 @@ public:
   /// reference: only a signer may ask for that work.
   /// @param signedUris receives the URIs of the references when the answer is true, and is left alone otherwise.
   /// @return false when a digest or the signature value is wrong.
+  /// @throws OutOfMemoryException, and InvalidStateException when OpenSSL has cleaned itself up: neither is a verdict.
   /// @throws XmlSecurityException for an algorithm outside the profile, a reference that does not resolve to exactly one
   ///         node, a tree without canonical form, or when no candidate key can be used with the signature's algorithm.
   virtual bool Verify(const KeyInfoResolver &resolver, std::set<std::string> &signedUris) const = 0;
@@ -69,6 +70,7 @@ public:
 
   /// Computes the digests over the tree as it is now, and the signature value. The signature element must then be put
   /// into the tree; the place must not change the namespaces that its `SignedInfo` sees under exclusive canonicalisation.
+  /// @throws OutOfMemoryException, and InvalidStateException when OpenSSL has cleaned itself up.
   /// @throws XmlSecurityException when there is no reference, one does not resolve, or the key cannot sign with the
   ///         algorithm; the signature then stays blank. @throws InvalidStateException after `Sign`, for a key info content
   ///         that has a parent, and for a signature taken from a tree.

@@ -1,0 +1,94 @@
+// SPDX-License-Identifier: Apache-2.0
+
+#include "crypto/library_context.h"
+
+#include "crypto/openssl_errors.h"
+#include "crypto/openssl_use.h"
+
+#include <tarvel/crypto/certificate.h>
+#include <tarvel/crypto/system_configuration.h>
+
+#include <openssl/crypto.h>
+#include <openssl/provider.h>
+#include <openssl/ssl.h>
+
+#include <atomic>
+#include <cstdint>
+
+namespace Tarvel::Crypto {
+
+namespace {
+
+enum class Configuration { UNDECIDED, NONE, OF_SYSTEM };
+
+std::atomic<Configuration> configuration{Configuration::UNDECIDED};
+
+// Never freed: threads that run until the process ends use it.
+std::atomic<OSSL_LIB_CTX *> libraryContext{nullptr};
+
+/// What is decided; `wanted`, when nothing was before.
+Configuration Decide(Configuration wanted) noexcept {
+  Configuration decided = Configuration::UNDECIDED;
+  return configuration.compare_exchange_strong(decided, wanted) ? wanted : decided;
+}
+
+/// Even a failure to load it must not make OpenSSL fall back on the default context's providers.
+OSSL_LIB_CTX *CreateLibraryContext(const OpenSslErrorScope &errors) {
+  OSSL_LIB_CTX *const context = OSSL_LIB_CTX_new();
+  if (!context || !OSSL_PROVIDER_load(context, "default")) {
+    OSSL_LIB_CTX_free(context);
+    errors.Throw("Cannot load OpenSSL's default provider");
+  }
+  return context;
+}
+
+} // namespace
+
+OSSL_LIB_CTX *GetLibraryContext() noexcept {
+  return libraryContext.load(std::memory_order_acquire);
+}
+
+bool UsesSystemConfiguration() noexcept {
+  return configuration.load() == Configuration::OF_SYSTEM;
+}
+
+void InitialiseOpenSsl() {
+  const OpenSslErrorScope errors;
+  const bool isOfSystem = Decide(Configuration::NONE) == Configuration::OF_SYSTEM;
+  const std::uint64_t configurationFlag = isOfSystem ? OPENSSL_INIT_LOAD_CONFIG : OPENSSL_INIT_NO_LOAD_CONFIG;
+  // OpenSSL reads its configuration with the first context for TLS, unless it was told not to, which it heeds once for the
+  // whole process.
+  const bool isUsable = OPENSSL_init_crypto(0, nullptr) == 1; // else it has cleaned itself up, or lacks memory
+  if (!isUsable || OPENSSL_init_ssl(configurationFlag, nullptr) != 1) {
+    static std::atomic<bool> lackedMemory{false}; // OpenSSL does not try again what has failed once
+    lackedMemory = lackedMemory || errors.RanOutOfMemory();
+    if (lackedMemory) {
+      throw OutOfMemoryException();
+    }
+    if (!isUsable) {
+      throw InvalidStateException(OpenSslUse::ENDED);
+    }
+    errors.Throw("Cannot initialise OpenSSL");
+  }
+  if (!isOfSystem && !GetLibraryContext()) {
+    libraryContext.store(CreateLibraryContext(errors), std::memory_order_release);
+  }
+}
+
+LibraryContextScope::LibraryContextScope() noexcept : m_ofHost(OSSL_LIB_CTX_set0_default(GetLibraryContext())) {}
+
+LibraryContextScope::~LibraryContextScope() {
+  OSSL_LIB_CTX_set0_default(m_ofHost);
+}
+
+void UseSystemConfiguration() {
+  if (Decide(Configuration::OF_SYSTEM) != Configuration::OF_SYSTEM) {
+    throw InvalidStateException(
+        "The system's configuration of OpenSSL is asked for too late: OpenSSL is in use already");
+  }
+  OpenSslUse::Prepare();
+  const OpenSslUse use;
+  use.Require();
+}
+
+} // namespace Tarvel::Crypto

@@ -1,0 +1,59 @@
+// SPDX-License-Identifier: Apache-2.0
+
+#include "crypto/openssl_end.h"
+
+#include "system/fork_gate.h"
+
+#include <mutex>
+
+#include <unistd.h>
+
+namespace Tarvel::Crypto {
+
+namespace {
+
+// Constant-initialised and never destroyed.
+System::ForkSafeMutex mutex;       // guards the list
+OpenSslEndNotice *first = nullptr; // the newest
+
+} // namespace
+
+OpenSslEndNotice::OpenSslEndNotice(Function function, void *owner) noexcept
+    : m_function(function), m_owner(owner), m_process(getpid()) {
+  const std::lock_guard<System::ForkSafeMutex> lock(mutex);
+  m_next = first;
+  if (m_next) {
+    m_next->m_previous = this;
+  }
+  first = this;
+}
+
+void OpenSslEndNotice::Withdraw() noexcept {
+  const std::lock_guard<System::ForkSafeMutex> lock(mutex);
+  if (first == this) {
+    first = m_next;
+  }
+  if (m_previous) {
+    m_previous->m_next = m_next;
+  }
+  if (m_next) {
+    m_next->m_previous = m_previous;
+  }
+  m_previous = m_next = nullptr;
+}
+
+void OpenSslEndNotice::CallAll() noexcept {
+  const std::lock_guard<System::ForkSafeMutex> lock(mutex);
+  while (OpenSslEndNotice *const notice = first) {
+    first = notice->m_next;
+    if (first) {
+      first->m_previous = nullptr;
+    }
+    notice->m_next = nullptr;
+    if (notice->m_process == getpid()) {
+      notice->m_function(notice->m_owner);
+    }
+  }
+}
+
+} // namespace Tarvel::Crypto

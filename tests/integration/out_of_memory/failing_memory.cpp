@@ -1,0 +1,102 @@
+// SPDX-License-Identifier: Apache-2.0
+#include "integration/out_of_memory/failing_memory.h"
+
+#include <atomic>
+#include <cerrno>
+#include <cstdlib>
+#include <cstring>
+
+#include <libxml/xmlmemory.h>
+#include <openssl/crypto.h>
+
+namespace Testing {
+
+namespace {
+
+std::atomic<long> g_left{0}; // until one fails; 0 for none that does
+std::atomic<bool> g_goesOn{false};
+std::atomic<bool> g_hasFailed{false};
+std::atomic<long> g_live{0};
+
+/// As `malloc` does it.
+bool Fails() noexcept {
+  if (g_left.load() <= 0) {
+    return false;
+  }
+  if (g_left.fetch_sub(1) != 1) {
+    return false;
+  }
+  if (g_goesOn) {
+    g_left = 1;
+  }
+  g_hasFailed = true;
+  errno = ENOMEM;
+  return true;
+}
+
+void *Allocate(std::size_t bytes) noexcept {
+  void *const memory = bytes == 0 || Fails() ? nullptr : std::malloc(bytes);
+  g_live += memory != nullptr;
+  return memory;
+}
+
+void *Reallocate(void *memory, std::size_t bytes) noexcept {
+  if (!memory) {
+    return Allocate(bytes);
+  }
+  return Fails() ? nullptr : std::realloc(memory, bytes);
+}
+
+void Free(void *memory) noexcept {
+  g_live -= memory != nullptr;
+  std::free(memory);
+}
+
+char *Duplicate(const char *text) noexcept {
+  const std::size_t bytes = std::strlen(text) + 1;
+  void *const copy = Allocate(bytes);
+  return static_cast<char *>(copy ? std::memcpy(copy, text, bytes) : nullptr);
+}
+
+void *AllocateForOpenSsl(std::size_t bytes, const char *, int) {
+  return Allocate(bytes);
+}
+void *ReallocateForOpenSsl(void *memory, std::size_t bytes, const char *, int) {
+  if (memory && bytes == 0) {
+    Free(memory);
+    return nullptr;
+  }
+  return Reallocate(memory, bytes);
+}
+void FreeForOpenSsl(void *memory, const char *, int) {
+  Free(memory);
+}
+
+const bool IS_INSTALLED = CRYPTO_set_mem_functions(AllocateForOpenSsl, ReallocateForOpenSsl, FreeForOpenSsl) == 1 &&
+                          xmlMemSetup(Free, Allocate, Reallocate, Duplicate) == 0;
+
+} // namespace
+
+FailingMemory::FailingMemory(int number, Shortage shortage) {
+  if (!IS_INSTALLED) {
+    std::abort();
+  }
+  g_hasFailed = false;
+  g_goesOn = shortage == Shortage::FROM_THEN;
+  g_left = number;
+}
+
+FailingMemory::~FailingMemory() {
+  g_goesOn = false;
+  g_left = 0;
+}
+
+bool FailingMemory::HasFailed() const noexcept {
+  return g_hasFailed;
+}
+
+long CountForeignAllocations() {
+  return g_live;
+}
+
+} // namespace Testing
