@@ -44,6 +44,11 @@ void Require(bool isSet, const Crypto::OpenSslErrorScope &errors, const char *fa
   }
 }
 
+/// What OpenSSL's macros do, which take the list for a text that may be changed.
+bool SetList(SSL_CTX *context, int command, std::string list) {
+  return SSL_CTX_ctrl(context, command, 0, list.data()) == 1;
+}
+
 /// OpenSSL has applied the section "system_default" of whatever configuration the process has loaded to the new context.
 void ApplyOwnPolicy(SSL_CTX *context, const Crypto::OpenSslErrorScope &errors) {
   SSL_CTX_clear_options(context, SSL_CTX_get_options(context));
@@ -53,9 +58,9 @@ void ApplyOwnPolicy(SSL_CTX *context, const Crypto::OpenSslErrorScope &errors) {
   Require(SSL_CTX_set_cipher_list(context, CIPHERS) == 1 && SSL_CTX_set_ciphersuites(context, CIPHERS_OF_TLS_1_3) == 1,
           errors, NO_CIPHERS);
   SSL_CTX_set_security_level(context, MIN_SECURITY_LEVEL); // after the list, which may hold one
-  Require(SSL_CTX_set1_groups_list(context, GROUPS) == 1, errors, "Cannot choose groups");
-  Require(SSL_CTX_set1_sigalgs_list(context, SIGNATURE_ALGORITHMS) == 1 &&
-              SSL_CTX_set1_client_sigalgs_list(context, SIGNATURE_ALGORITHMS) == 1,
+  Require(SetList(context, SSL_CTRL_SET_GROUPS_LIST, GROUPS), errors, "Cannot choose groups");
+  Require(SetList(context, SSL_CTRL_SET_SIGALGS_LIST, SIGNATURE_ALGORITHMS) &&
+              SetList(context, SSL_CTRL_SET_CLIENT_SIGALGS_LIST, SIGNATURE_ALGORITHMS),
           errors, "Cannot choose signature algorithms");
   SSL_CTX_set_block_padding(context, 0);
 }
