@@ -20,8 +20,8 @@ public:
   /// A received message as UTF-8; nothing when it is not in this charset. An XML declaration in it is left as it is.
   std::optional<std::string> Decode(std::string_view message) const;
 
-  /// An answer as it is sent. What the charset does not have is written as a character reference; but for UTF-8, an XML
-  /// declaration comes first.
+  /// An answer as it is sent. What the charset does not have is written as a character reference. In any charset but
+  /// UTF-8, an XML declaration comes first.
   std::string Encode(const std::string &answer) const;
 
   /// The answers' media type.
