@@ -3,7 +3,9 @@
 /// HTTP responses: whatever the pieces in which a response comes, the outcome is the same; limits hold; and nothing but
 /// the documented exception comes out.
 
+#include "http/charset.h"
 #include "http/response_reader.h"
+#include "xml/characters.h"
 
 #include <cstddef>
 #include <cstdint>
@@ -24,28 +26,32 @@ void Require(bool condition) {
   }
 }
 
-/// What came of `bytes`; none for a refusal. Bytes after the end are refused only as far as they have come, so only what
-/// stands before them is fed.
-struct Outcome {
-  std::optional<ResponseData> response;
-  std::size_t taken = 0;
-};
-
-Outcome Read(std::string_view bytes, std::size_t pieceLength) {
-  Outcome outcome;
+/// What came of `bytes`; none for a refusal.
+std::optional<ResponseData> Read(std::string_view bytes, std::size_t pieceLength) {
   ResponseReader reader;
   try {
-    while (outcome.taken < bytes.size() && !reader.IsComplete()) {
-      const std::string_view piece = bytes.substr(outcome.taken, pieceLength);
+    while (!bytes.empty()) {
+      const std::string_view piece = bytes.substr(0, pieceLength);
       reader.Put(piece);
-      outcome.taken += piece.size();
+      bytes.remove_prefix(piece.size());
     }
     reader.PutEnd();
-    outcome.response = reader.Take();
+    return reader.Take();
   } catch (const HttpException &refusal) {
     Require(*refusal.what() != '\0');
+    return std::nullopt;
   }
-  return outcome;
+}
+
+/// Whatever is declared as ISO-8859-1 becomes UTF-8, and not much longer than it may.
+void RequireUtf8Of(const ResponseData &response) {
+  for (const auto &field : response.fields) {
+    Require(Tarvel::Http::FindCharset(field.second).size() <= 40);
+  }
+  std::string recoded = response.body;
+  Tarvel::Http::RecodeToUtf8(recoded, "ISO-8859-1");
+  Require(Tarvel::Xml::FindInvalidUtf8(recoded) == std::string_view::npos);
+  Require(recoded.size() <= 2 * response.body.size() + 3); // "UTF-8" in place of "l1"
 }
 
 void RequireWithinLimits(const ResponseData &response) {
@@ -63,20 +69,19 @@ void RequireWithinLimits(const ResponseData &response) {
 
 extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t *data, std::size_t size) {
   const std::string_view bytes(reinterpret_cast<const char *>(data), size);
-  const Outcome single = Read(bytes, 1);
-  if (single.response) {
-    RequireWithinLimits(*single.response);
+  const std::optional<ResponseData> single = Read(bytes, 1);
+  if (single) {
+    RequireWithinLimits(*single);
+    RequireUtf8Of(*single);
   }
   for (const std::size_t pieceLength : {size, std::size_t(3), std::size_t(100)}) {
-    // After its last byte a response is complete, and the pieces below must not reach beyond it.
-    const Outcome pieces =
-        Read(single.response ? bytes.substr(0, single.taken) : bytes, pieceLength == 0 ? 1 : pieceLength);
-    Require(pieces.response.has_value() == single.response.has_value());
-    if (pieces.response) {
-      Require(pieces.response->status == single.response->status);
-      Require(pieces.response->reason == single.response->reason);
-      Require(pieces.response->fields == single.response->fields);
-      Require(pieces.response->body == single.response->body);
+    const std::optional<ResponseData> pieces = Read(bytes, pieceLength == 0 ? 1 : pieceLength);
+    Require(pieces.has_value() == single.has_value());
+    if (pieces) {
+      Require(pieces->status == single->status);
+      Require(pieces->reason == single->reason);
+      Require(pieces->fields == single->fields);
+      Require(pieces->body == single->body);
     }
   }
   return 0;

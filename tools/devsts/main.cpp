@@ -57,7 +57,7 @@ void Serve(const Options &options) {
   const StateFolder state = OpenStateFolder(options.state);
   const TokenService service(state, std::move(users), options.tolerance,
                              options.keytab ? CreateGssAcceptor(*options.keytab, options.state / "replays") : nullptr);
-  const RequestHandler handler(service, options.fault);
+  const RequestHandler handler(service, options.fault, Charset(options.charset));
   HttpsListener listener(state.tls, options.port, handler);
   listener.Start();
   WriteReadyLine(state, listener.GetPort());

@@ -26,6 +26,8 @@ std::string Footer() {
          "  ssoclient-devsts --state DIR --keytab sts.keytab\n"
          "      Negotiates as well, as every service whose key is in the keytab. alice@CORP.EXAMPLE is the user\n"
          "      alice@corp.example.\n"
+         "  ssoclient-devsts --state DIR --charset ISO-8859-1\n"
+         "      Takes what it receives for ISO-8859-1, as services do that get no charset, and answers so.\n"
          "  ssoclient-devsts --state DIR --fault wrong-signer\n"
          "      Signs every token with a key that nobody trusts.\n";
 }
@@ -47,6 +49,10 @@ std::variant<Options, int> ReadOptions(int argc, char **argv) {
   app.add_option("--keytab", options.keytab, "Keytab of the service's keys, for SPNEGO with Kerberos")
       ->type_name("FILE");
   app.add_option("--fault", faultName, "Misbehave at every request; names below")->type_name("NAME");
+  app.add_option("--charset", options.charset, "Read requests and answer in this charset")
+      ->capture_default_str()
+      ->type_name("NAME")
+      ->check(CLI::IsMember({"UTF-8", "ISO-8859-1", "windows-1252"}, CLI::ignore_case));
   app.add_option("--tolerance", tolerance, "How far clocks may differ, in seconds")
       ->capture_default_str()
       ->check(CLI::Range(0, LONGEST_TOLERANCE));

@@ -10,6 +10,7 @@
 #include <cstdint>
 #include <filesystem>
 #include <optional>
+#include <string>
 #include <variant>
 
 namespace DevSts {
@@ -20,6 +21,7 @@ struct Options {
   std::optional<std::filesystem::path> users;
   std::optional<std::filesystem::path> keytab;
   Fault fault;
+  std::string charset = "UTF-8";
   std::chrono::seconds tolerance{60};
   bool untilEof = false;
 };

@@ -80,11 +80,16 @@ Delivery RequestHandler::Answer(const HttpRequest &request) const {
     LogLine(request.peer + " " + request.target + ": fault");
     return Deliver({}, fault, request.keepOpen);
   }
-  const SoapAnswer answer = m_service.Answer(Unquoted(request.soapAction), request.body, fault);
+  const std::optional<std::string> message = m_charset.Decode(request.body);
+  if (!message) {
+    return Plain(400, "The message is not in the service's charset.\n", request.keepOpen);
+  }
+  const SoapAnswer answer = m_service.Answer(Unquoted(request.soapAction), *message, fault);
   LogLine(request.peer + " " + request.target + ": " + answer.log);
   HttpAnswer http;
   http.status = answer.status;
-  http.body = answer.body;
+  http.contentType = m_charset.ContentType();
+  http.body = m_charset.Encode(answer.body);
   return Deliver(http, fault, request.keepOpen);
 }
 

@@ -4,6 +4,7 @@
 
 #pragma once
 
+#include "charset.h"
 #include "delivery.h"
 #include "token_service.h"
 
@@ -29,8 +30,10 @@ struct HttpRequest {
 /// Any number of threads may use it at once.
 class RequestHandler {
 public:
-  /// `service` outlives the handler. `fault` is that of every request that names none of its own.
-  RequestHandler(const TokenService &service, const Fault &fault) : m_service(service), m_fault(fault) {}
+  /// `service` outlives the handler. `fault` is that of every request that names none of its own; `charset` that of every
+  /// message.
+  RequestHandler(const TokenService &service, const Fault &fault, const Charset &charset)
+      : m_service(service), m_fault(fault), m_charset(charset) {}
 
   Delivery Handle(const HttpRequest &request) const noexcept;
 
@@ -43,6 +46,7 @@ private:
 
   const TokenService &m_service;
   const Fault m_fault;
+  const Charset m_charset;
   mutable std::mutex m_mutex;
   mutable std::set<std::string, std::less<>> m_met; ///< guarded by the mutex
 };

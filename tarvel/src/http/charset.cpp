@@ -18,6 +18,8 @@ namespace {
 constexpr std::size_t MAX_CHARSET_LENGTH = 40;
 constexpr std::size_t MAX_DECLARATION_LENGTH = 256; // of an XML declaration that is looked into
 
+constexpr std::string_view XML_SPACE = " \t\r\n";
+
 constexpr std::array<std::string_view, 9> LATIN1_NAMES{
     "ISO-8859-1", "ISO_8859-1", "ISO_8859-1:1987", "iso-ir-100", "latin1", "l1", "IBM819", "CP819", "csISOLatin1"};
 
@@ -53,7 +55,6 @@ std::string TakeValue(std::string_view &rest) {
 /// The value of the encoding in the XML declaration that `text` begins with; empty when there is none.
 std::string_view FindDeclaredEncoding(std::string_view text) {
   constexpr std::string_view BEGINNING = "<?xml";
-  constexpr std::string_view SPACE = " \t\r\n";
   std::string_view rest = text.substr(0, MAX_DECLARATION_LENGTH);
   const std::size_t close = rest.find("?>");
   if (rest.substr(0, BEGINNING.size()) != BEGINNING || close == std::string_view::npos) {
@@ -61,7 +62,7 @@ std::string_view FindDeclaredEncoding(std::string_view text) {
   }
   rest = rest.substr(0, close);
   rest.remove_prefix(BEGINNING.size());
-  const auto skipSpace = [&rest] { rest.remove_prefix(std::min(rest.find_first_not_of(SPACE), rest.size())); };
+  const auto skipSpace = [&rest] { rest.remove_prefix(std::min(rest.find_first_not_of(XML_SPACE), rest.size())); };
   for (;;) {
     skipSpace();
     const std::string_view name = rest.substr(0, rest.find_first_of(" \t\r\n="));

@@ -31,7 +31,7 @@ constexpr int MAX_PORT = 65535;
 /// What a completion gets when there is no memory to say more.
 const NetworkException &OutOfMemory() {
   const Computation computing;
-  static const NetworkException *const failure = new NetworkException("Out of memory"); // never destroyed
+  static const NetworkException *const failure = new NetworkException("There is not enough memory"); // never destroyed
   return *failure;
 }
 
@@ -140,7 +140,7 @@ void TcpClientSocketImpl::TryStep(const Step &step) noexcept {
   try {
     step();
   } catch (const std::bad_alloc &) {
-    EndConnect("out of memory");
+    EndConnect("there is not enough memory");
   } catch (const std::exception &failure) {
     EndConnect(failure.what());
   } catch (...) {

@@ -3,6 +3,8 @@
 
 #include "messages.h"
 
+#include "support/work_folder.h"
+
 #include <gmock/gmock.h>
 
 namespace DevStsTest {
@@ -50,6 +52,34 @@ TEST_F(Http, OtherMethodsPathsAndMediaTypes) {
   EXPECT_EQ(StatusOf(PostBytes(request.soapAction, request.body, "/sts", "application/soap+xml")), 415);
   EXPECT_EQ(StatusOf(PostBytes(request.soapAction, request.body, "/sts", "")), 415);
   EXPECT_EQ(StatusOf(PostBytes(request.soapAction, request.body, "/sts", "Text/XML; charset=utf-8")), 200);
+}
+
+TEST(HttpInAnotherCharset, RequestsAndAnswersAreInIt) {
+  const Testing::WorkFolder folder;
+  const Testing::DevSts service(
+      {"--charset", "iso-8859-1", "--users",
+       folder.Write("users.json", R"([{"name":"zoë@corp.example","password":"ü","last":"ł"}])")});
+  const auto sendPassword = [&service](const std::string &user, const std::string &password) {
+    SsoClient::Request request = PasswordRequest();
+    request.body = Replaced(Replaced(request.body, "alice@", user + "@"), "wonderland", password);
+    return Send(service, request);
+  };
+  const HttpAnswer answer = sendPassword("zo\xEB", "\xFC");
+  EXPECT_TRUE(IsIssued(answer));
+  EXPECT_THAT(answer.head, HasSubstr("\r\nContent-Type: text/xml; charset=iso-8859-1\r\n"));
+  EXPECT_THAT(answer.body, testing::StartsWith("<?xml version=\"1.0\" encoding=\"iso-8859-1\"?><"));
+  EXPECT_THAT(answer.body, HasSubstr(">zo\xEB@corp.example<"));
+  EXPECT_THAT(answer.body, HasSubstr(">&#322;<"));
+  EXPECT_TRUE(IsIssued(sendPassword("zo&#xEB;", "&#xFC;")));
+  EXPECT_FALSE(IsIssued(sendPassword("zo\xC3\xAB", "\xC3\xBC")));
+}
+
+TEST(HttpInAnotherCharset, ARequestThatIsNotInItIsRefused) {
+  const Testing::DevSts service({"--charset", "windows-1252"});
+  SsoClient::Request request = PasswordRequest();
+  request.body = Replaced(request.body, "wonderland", "\x81"); // which windows-1252 does not have
+  EXPECT_EQ(Send(service, request).status, 400);
+  EXPECT_TRUE(IsIssued(Send(service, PasswordRequest())));
 }
 
 TEST_F(Http, OversizedBody) {

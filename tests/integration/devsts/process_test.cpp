@@ -227,6 +227,7 @@ TEST(CommandLine, RefusalsAreOneLineAndExitCode2) {
       {{"--fault", "no-such-fault"}, "--fault: no fault is named 'no-such-fault'; see --help"},
       {{"--tolerance", "-1"}, "--tolerance: Value -1 not in range 0 to 86400"},
       {{"--port", "65536"}, "Could not convert: --port = 65536"},
+      {{"--charset", "EBCDIC"}, "--charset: EBCDIC not in {UTF-8,ISO-8859-1,windows-1252}"},
       {{"--no-such-option"}, "The following argument was not expected: --no-such-option"},
       {{"--state"}, "--state: 1 required TEXT missing"},
   };

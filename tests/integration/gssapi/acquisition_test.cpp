@@ -5,6 +5,7 @@
 #include "integration/gssapi/service_world.h"
 #include "support/process_resources.h"
 #include "support/throws_message.h"
+#include "support/work_folder.h"
 
 #include <ssoclient/saml_token.h>
 
@@ -63,6 +64,32 @@ TEST(GssAcquisition, GivesAHolderOfKeyTokenToWhomHasAKeyBesides) {
   ASSERT_EQ(token->GetConfirmationMethod(), SamlToken::HOLDER_OF_KEY);
   EXPECT_EQ(token->GetConfirmationCertificate()->GetSha256Thumbprint(),
             config.holderOfKeyConfig->certificate->GetSha256Thumbprint());
+}
+
+TEST(GssAcquisition, CarriesTextBeyondAsciiToAndFromAServiceInLatin1) {
+  const Testing::WorkFolder folder;
+  const std::string users =
+      folder.Write("users.json", R"([{"name":"alice@corp.example","password":"-","first":"Älice ł","last":"語 😀",
+                         "groups":["größe-ł-語-😀@corp.example"]}])");
+  const ServiceWorld world({.name = "CORP.EXAMPLE"}, {"--charset", "ISO-8859-1", "--users", users});
+  TokenSpec spec = HourSpec();
+  spec.advice = {{"https://advice.example/ü-ł", {{"größe-語", {"rød", "😀"}}}}};
+  for (const char *const identity : {"", "client"}) {
+    const auto handler = CreateSpnegoHandler(DceStyle());
+    const auto token = CreateSecurityTokenService(world.MakeConfig("", identity))->AcquireTokenByGSS(spec, *handler);
+    EXPECT_EQ(SubjectOf(*token), "alice@corp.example");
+    std::vector<PrincipalId> groups;
+    token->GetGroups(groups);
+    ASSERT_EQ(groups.size(), 1u);
+    EXPECT_EQ(groups[0].name, "größe-ł-語-😀");
+    std::vector<Advice> advice;
+    token->GetAdvice(advice);
+    ASSERT_EQ(advice.size(), 1u);
+    EXPECT_EQ(advice[0].source, "https://advice.example/ü-ł");
+    ASSERT_EQ(advice[0].attributes.size(), 1u);
+    EXPECT_EQ(advice[0].attributes[0].name, "größe-語");
+    EXPECT_EQ(advice[0].attributes[0].values, (std::vector<std::string>{"rød", "😀"}));
+  }
 }
 
 TEST(GssAcquisition, AsksForWhatTheSpecSaysOverSeveralLegs) {

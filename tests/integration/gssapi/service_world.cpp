@@ -15,10 +15,17 @@ std::string PathOf(const std::string &kerberosName) {
   return kerberosName.substr(kerberosName.find(':') + 1);
 }
 
+std::vector<std::string> WithKeytab(const std::string &keytab, const std::vector<std::string> &arguments) {
+  std::vector<std::string> all = {"--keytab", keytab};
+  all.insert(all.end(), arguments.begin(), arguments.end());
+  return all;
+}
+
 } // namespace
 
-ServiceWorld::ServiceWorld(const RealmSettings &settings)
-    : m_realm(settings), m_service({"--keytab", PathOf(m_serviceKeytab)}), m_tls(Tarvel::Ssl::CreateSSLContext()) {
+ServiceWorld::ServiceWorld(const RealmSettings &settings, const std::vector<std::string> &arguments)
+    : m_realm(settings), m_service(WithKeytab(PathOf(m_serviceKeytab), arguments)),
+      m_tls(Tarvel::Ssl::CreateSSLContext()) {
   m_tls->TrustFile(m_service.PathOf("authority.crt"));
   m_realm.GetTicket("alice", m_realm.AddPrincipal("alice"), m_realm.GetDefaultCache());
 }

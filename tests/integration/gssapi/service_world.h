@@ -13,6 +13,7 @@
 
 #include <memory>
 #include <string>
+#include <vector>
 
 namespace Testing {
 
@@ -20,7 +21,9 @@ namespace Testing {
 /// alice's ticket in the default cache.
 class ServiceWorld {
 public:
-  explicit ServiceWorld(const RealmSettings &settings = {.name = "CORP.EXAMPLE"});
+  /// @param arguments of the service, which come behind its keytab
+  explicit ServiceWorld(const RealmSettings &settings = {.name = "CORP.EXAMPLE"},
+                        const std::vector<std::string> &arguments = {});
 
   const KerberosRealm &GetRealm() const noexcept { return m_realm; }
   const DevSts &GetService() const noexcept { return m_service; }

@@ -208,8 +208,8 @@ TEST_P(WithoutMemory, AConnectToAnAddressIsCompletedOnce) {
       {DoNothing, [&](TcpClientSocket &socket, Note &note) { socket.AsyncConnect(host, port, note.ForEnd()); },
        DoNothing});
   for (const std::string &message : messages) {
-    EXPECT_TRUE(message.empty() || message == "(thrown)" || message == Target(host, port) + "out of memory" ||
-                message == "Out of memory")
+    EXPECT_TRUE(message.empty() || message == "(thrown)" ||
+                message == Target(host, port) + "there is not enough memory" || message == "There is not enough memory")
         << message;
   }
   EXPECT_EQ(messages.count(""), 1u);
@@ -229,8 +229,8 @@ TEST_P(WithoutMemory, AConnectToANameIsCompletedOnce) {
       {DoNothing, [&](TcpClientSocket &socket, Note &note) { socket.AsyncConnect(host, port, note.ForEnd()); },
        DoNothing});
   for (const std::string &message : messages) {
-    EXPECT_TRUE(message.empty() || message == "(thrown)" || message == Target(host, port) + "out of memory" ||
-                message == "Out of memory")
+    EXPECT_TRUE(message.empty() || message == "(thrown)" ||
+                message == Target(host, port) + "there is not enough memory" || message == "There is not enough memory")
         << message;
   }
   EXPECT_EQ(messages.count(""), 1u);
@@ -255,8 +255,8 @@ TEST_P(WithoutMemory, AConnectOfAConnectionSpecIsCompletedOnce) {
                      },
                      DoNothing});
     for (const std::string &message : messages) {
-      EXPECT_TRUE(message == outcome || message == "(thrown)" || message == target + "out of memory" ||
-                  message == "Out of memory")
+      EXPECT_TRUE(message == outcome || message == "(thrown)" || message == target + "there is not enough memory" ||
+                  message == "There is not enough memory")
           << message;
     }
     EXPECT_EQ(messages.count(outcome), 1u);
@@ -276,7 +276,8 @@ TEST_P(WithoutMemory, AConnectThatIsClosedIsCompletedOnce) {
                                      socket.Close();
                                    },
                                    DoNothing});
-  EXPECT_EQ(messages, (std::set<std::string>{"Out of memory", Target(host, full.GetPort()) + "cancelled"}));
+  EXPECT_EQ(messages,
+            (std::set<std::string>{"There is not enough memory", Target(host, full.GetPort()) + "cancelled"}));
 }
 
 void Connect(TcpClientSocket &socket, int port) {
@@ -295,7 +296,7 @@ TEST_P(WithoutMemory, AReadIsCompletedOnce) {
                    [](TcpClientSocket &socket) { socket.Close(); }});
   const std::string closed =
       "The connection to 127.0.0.1:" + std::to_string(server.GetPort()) + " was closed by this side";
-  EXPECT_EQ(messages, (std::set<std::string>{"(thrown)", "Out of memory", closed}));
+  EXPECT_EQ(messages, (std::set<std::string>{"(thrown)", "There is not enough memory", closed}));
 }
 
 TEST_P(WithoutMemory, AWriteInSeveralPartsIsCompletedOnce) {
@@ -311,7 +312,7 @@ TEST_P(WithoutMemory, AWriteInSeveralPartsIsCompletedOnce) {
   const std::string broken =
       "The connection to 127.0.0.1:" + std::to_string(server.GetPort()) + " broke: Cannot allocate memory";
   for (const std::string &one : messages) {
-    EXPECT_TRUE(one.empty() || one == "(thrown)" || one == broken || one == "Out of memory") << one;
+    EXPECT_TRUE(one.empty() || one == "(thrown)" || one == broken || one == "There is not enough memory") << one;
   }
   EXPECT_EQ(messages.count(""), 1u);
   EXPECT_EQ(messages.count("(thrown)"), 1u);

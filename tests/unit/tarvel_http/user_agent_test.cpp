@@ -252,7 +252,7 @@ struct Thrown {
 };
 
 const Thrown THROWN[] = {
-    {[] { throw std::bad_alloc(); }, "OutOfMemoryException: Out of memory"},
+    {[] { throw std::bad_alloc(); }, "OutOfMemoryException: There is not enough memory"},
     {[] { throw std::runtime_error("foreign"); },
      "InvalidStateException: The request to sts.example:80 failed: foreign"},
     {[] { throw 42; },

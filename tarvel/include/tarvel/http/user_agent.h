@@ -93,9 +93,9 @@ public:
 
   /// Connects, sends and reads the response, without blocking, and without a time-out of its own: who does not wait may
   /// cancel the item. Redirects are not followed. At most 16 interim responses (1xx but 101) are passed over; one more is
-  /// an HttpException. A status other than 2xx and 500 is reported as soon as its header is there. For those two, content
-  /// is not decoded; as no coding is asked for, content that has one is a failure. Bytes after the response are ignored.
-  /// The request's body is wiped once it is sent.
+  /// an HttpException. A status other than 2xx and 500 is reported as soon as its header is there. With 2xx and 500,
+  /// content is not decoded; as no coding is asked for, content that has one is a failure. Bytes after the response are
+  /// ignored. The request's body is wiped once it is sent.
   /// @throws InvalidArgumentException for a request that `CreateHttpRequest` did not make, InvalidStateException for one
   ///         that has been started, and whatever the connection specification throws; the completion function is not
   ///         called then.

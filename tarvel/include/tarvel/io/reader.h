@@ -25,7 +25,7 @@ public:
   virtual std::string ReadToEnd(std::size_t maximumBytes);
 
   /// The charset that the source declares for its bytes, as it is written there ("windows-1252"); empty when it declares
-  /// none. For messages: whoever can, hands on UTF-8.
+  /// none. For messages only: what the reader could make UTF-8 of is UTF-8 already.
   virtual std::string GetDeclaredCharset() const;
 
 protected:
