@@ -4,6 +4,7 @@
 #include "gss_status.h"
 
 #include <tarvel/core/exception.h>
+#include <tarvel/core/string_util.h>
 
 #include <gssapi/gssapi_krb5.h>
 
@@ -17,7 +18,8 @@ void ImportName(const std::string &text, gss_const_OID form, NameHandle &name) {
   GssStatus status;
   status.major = gss_import_name(&status.minor, &buffer, &writableForm, name.Slot());
   if (status.IsError()) {
-    throw Tarvel::InvalidArgumentException("'" + text + "' is no name: " + DescribeStatus(status, GSS_C_NO_OID));
+    throw Tarvel::InvalidArgumentException("'" + Tarvel::StringUtil::Shorten(text) +
+                                           "' is no name: " + DescribeStatus(status, GSS_C_NO_OID));
   }
 }
 
@@ -25,7 +27,8 @@ void ImportServiceName(const std::string &service, NameHandle &name) {
   const bool isPrincipal = service.find('/') != std::string::npos;
   const std::size_t separator = service.find(isPrincipal ? '/' : '@');
   if (separator == 0 || separator == std::string::npos || separator + 1 == service.size()) {
-    throw Tarvel::InvalidArgumentException("'" + service + "' is no service, as HTTP@host or HTTP/host@REALM");
+    throw Tarvel::InvalidArgumentException("'" + Tarvel::StringUtil::Shorten(service) +
+                                           "' is no service, as HTTP@host or HTTP/host@REALM");
   }
   ImportName(service, isPrincipal ? GSS_KRB5_NT_PRINCIPAL_NAME : GSS_C_NT_HOSTBASED_SERVICE, name);
 }
