@@ -24,7 +24,8 @@ using NameLookup = std::function<AddressList(const std::string &host)>;
 AddressList LookUpName(const std::string &host);
 
 /// Puts `lookup` in the resolver's place for the whole process, for as long as this lives: for tests. `lookup` is called
-/// on any thread, several at once, and may still run after the scope's end.
+/// on any thread, several at once, and may still run after the scope's end. A connection may join a look-up that began
+/// before the scope: a test whose look-ups hang waits for their end.
 class ScopedNameLookup {
 public:
   explicit ScopedNameLookup(NameLookup lookup);

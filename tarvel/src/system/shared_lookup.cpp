@@ -137,7 +137,7 @@ void Run(Lookup &lookup, const std::string &host) {
 /// A new look-up for `asker`. Under the registry's lock, for which the look-up waits before it begins.
 std::shared_ptr<Lookup> StartLookup(Registry &registry, const std::string &host, const std::string &name,
                                     const Ref<Asker> &asker) {
-  const auto lookup = std::make_shared<Lookup>();
+  auto lookup = std::make_shared<Lookup>();
   lookup->name = name;
   lookup->askers.push_back(asker);
   const auto place = registry.lookups.emplace(name, lookup).first;
