@@ -12,6 +12,8 @@
 #include <boost/asio/post.hpp>
 
 #include <cerrno>
+#include <new>
+#include <string>
 #include <sys/socket.h>
 #include <unistd.h>
 #include <utility>
