@@ -35,16 +35,15 @@ std::optional<ResolverFailure> g_resolverFailure;
 } // namespace
 
 // The linker calls this in place of the C library's function.
-extern "C" {
-int __real_getaddrinfo(const char *name, const char *service, const addrinfo *hints, addrinfo **list);
-int __wrap_getaddrinfo(const char *name, const char *service, const addrinfo *hints, addrinfo **list);
-int __wrap_getaddrinfo(const char *name, const char *service, const addrinfo *hints, addrinfo **list) {
+int RealResolve(const char *name, const char *service, const addrinfo *hints,
+                addrinfo **list) asm("__real_getaddrinfo");
+int Resolve(const char *name, const char *service, const addrinfo *hints, addrinfo **list) asm("__wrap_getaddrinfo");
+int Resolve(const char *name, const char *service, const addrinfo *hints, addrinfo **list) {
   if (g_resolverFailure) {
     errno = g_resolverFailure->error;
     return g_resolverFailure->code;
   }
-  return __real_getaddrinfo(name, service, hints, list);
-}
+  return RealResolve(name, service, hints, list);
 }
 
 namespace Testing {
