@@ -14,6 +14,8 @@
 
 #include <cerrno>
 #include <mutex>
+#include <new>
+#include <string>
 #include <sys/socket.h>
 #include <unistd.h>
 #include <utility>

@@ -89,12 +89,10 @@ void operator delete[](void *piece, std::size_t) noexcept {
 }
 
 // The linker calls this in place of the C library's function.
-extern "C" {
-void *__real_aligned_alloc(std::size_t alignment, std::size_t size);
-void *__wrap_aligned_alloc(std::size_t alignment, std::size_t size);
-void *__wrap_aligned_alloc(std::size_t alignment, std::size_t size) {
-  return IsRefused() ? nullptr : __real_aligned_alloc(alignment, size);
-}
+void *RealAlignedAllocate(std::size_t alignment, std::size_t size) asm("__real_aligned_alloc");
+void *AlignedAllocate(std::size_t alignment, std::size_t size) asm("__wrap_aligned_alloc");
+void *AlignedAllocate(std::size_t alignment, std::size_t size) {
+  return IsRefused() ? nullptr : RealAlignedAllocate(alignment, size);
 }
 
 namespace Testing {
