@@ -319,7 +319,7 @@ const Refusal REFUSALS[] = {
      2,
      "UsageException",
      "usage",
-     "Could not convert: --tolerance = 1x; see ssoclient --help"},
+     "--tolerance: must be a whole number; see ssoclient --help"},
     {"UnknownOption",
      {"--nope", "--trust", "sts-rsa.crt", "bearer.xml"},
      2,
