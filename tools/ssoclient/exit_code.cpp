@@ -92,6 +92,9 @@ std::string ExitCodeHelp() {
 }
 
 Failure Classify(const std::exception &failure) noexcept {
+  if (const auto *const hinted = dynamic_cast<const HintedException *>(&failure)) {
+    return hinted->GetFailure();
+  }
   for (const Row &row : TABLE) {
     if (row.matches(failure)) {
       return row.failure;

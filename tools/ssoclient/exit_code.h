@@ -43,4 +43,18 @@ struct Failure {
 /// Looks `failure` up in the one table of failures.
 Failure Classify(const std::exception &failure) noexcept;
 
+/// A failure with what its text does not say: what the caller may do about it. It means what the failure means.
+class HintedException : public std::runtime_error {
+public:
+  HintedException(const std::exception &failure, const std::string &hint)
+      : std::runtime_error(failure.what()), m_failure(Classify(failure)), m_hint(hint) {}
+
+  const Failure &GetFailure() const noexcept { return m_failure; }
+  const std::string &GetHint() const noexcept { return m_hint; }
+
+private:
+  Failure m_failure;
+  std::string m_hint;
+};
+
 } // namespace SsoClient::Tool
