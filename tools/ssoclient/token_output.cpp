@@ -8,11 +8,22 @@
 #include "token_report.h"
 #include "unmet_request.h"
 
+#include <tarvel/core/exception.h>
+
 namespace SsoClient::Tool {
 namespace {
 
 constexpr const char *GROUP = "Output";
 constexpr const char *STANDARD_OUTPUT = "-";
+
+/// Shows on standard output what the token in `file` says.
+void ShowBeside(const std::string &file, const std::string &text) {
+  try {
+    WriteOutput(text);
+  } catch (const Tarvel::IOException &failure) {
+    throw OutputException(file + " is written, but not what it says: " + failure.what());
+  }
+}
 
 } // namespace
 
@@ -52,7 +63,7 @@ void WriteToken(const IssuedToken &issued, const TokenSpec &spec, std::int64_t t
   }
   WriteFileWhole(options.file, Render(report, Format::XML), options.replace);
   if (output.format != Format::XML) {
-    WriteOutput(Render(report, output.format));
+    ShowBeside(options.file, Render(report, output.format));
   }
 }
 
