@@ -35,11 +35,12 @@ namespace SsoClient {
 /// - `Tarvel::Xml::Security::XmlSecurityException` for an identity whose key cannot sign with RSA-SHA256 (an EC key),
 /// - `Tarvel::Xml::Security::XmlSecurityException` or `Tarvel::Xml::XMLParseException` for an assertion in the response
 ///   that cannot be taken out of it as a document of its own.
-/// All of them are `Tarvel::Exception`. Nothing is tried again. A token that is returned is never null.
+/// All of them are `Tarvel::Exception`. Nothing is tried again. A token that is returned is null only when the response
+/// holds an empty text in its place.
 class SSOCLIENT_API SecurityTokenService {
 public:
-  /// Told once how an operation ended: with the token and null, or with null and the exception, which is good during the
-  /// call only (`Clone` keeps it).
+  /// Told once how an operation ended: with the token (null as above) and null, or with null and the exception, which is
+  /// good during the call only (`Clone` keeps it).
   using TokenCompletion =
       std::function<void(const std::shared_ptr<const SamlToken> &token, const Tarvel::Exception *failure)>;
 
