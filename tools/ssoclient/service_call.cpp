@@ -33,7 +33,11 @@ IssuedToken AskForToken(const std::function<std::shared_ptr<const SamlToken>()> 
   }
   const Tarvel::System::DateTime askedAt = Tarvel::System::GetUtcDateTime();
   try {
-    return {CallService(call), askedAt};
+    const std::shared_ptr<const SamlToken> token = CallService(call);
+    if (!token) {
+      throw SsoException("The response holds no token");
+    }
+    return {token, askedAt};
   } catch (const SsoException &failure) {
     if (doubt && IsRefusal(failure)) {
       throw HintedException(failure, doubt->hint);

@@ -50,8 +50,9 @@ struct IssuedToken {
   Tarvel::System::DateTime askedAt; ///< by this machine's clock
 };
 
-/// The token that `call` gets from the service.
+/// The token that `call` gets from the service; never null.
 /// @param doubt null for none
+/// @throws SsoException for a response without a token.
 /// @throws HintedException when the service refuses a request that there is a doubt about, and as `CallService` does.
 IssuedToken AskForToken(const std::function<std::shared_ptr<const SamlToken>()> &call, const Doubt *doubt,
                         const OutputOptions &output);
