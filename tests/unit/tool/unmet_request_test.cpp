@@ -116,7 +116,7 @@ TEST(FindUnmet, WantsEachValueOfEachAdviceInItsPlace) {
   spec.advice = {{"mapper", {{"color", {"green", "blue"}}, {"size", {"10"}}}}, {"audit", {{"by", {"alice"}}}}};
   TokenFacts facts = HourFrom();
   facts.advice = {{"audit", {{"by", {"bob", "alice"}}, {"color", {"blue"}}}},
-                  {"mapper", {{"size", {"green"}}}},
+                  {"mapper", {{"size", {"green"}}, {"shape", {"10"}}}},
                   {"mapper", {{"color", {"green"}}}}};
   EXPECT_THAT(WantedOf(spec, facts), ElementsAre("the advice mapper:color=blue, mapper:size=10"));
 }
