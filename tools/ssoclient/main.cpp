@@ -116,7 +116,7 @@ std::string Explain(const CLI::App &app, const CLI::ParseError &error) {
   if (dynamic_cast<const CLI::ExtrasError *>(&error)) {
     return DescribeExtras(extras);
   }
-  const std::string message = error.what();
+  std::string message = error.what();
   if (dynamic_cast<const CLI::ConversionError *>(&error)) {
     return message.substr(0, message.find(" = ")); // without the value
   }

@@ -247,10 +247,13 @@ TEST(Thumbprint, IsTakenWithAllColonsOrWithNone) {
 TEST(Thumbprint, OfAnyOtherFormIsAWrongCommandLine) {
   const std::string plain = THUMBPRINT;
   const std::string colons = WithColons(plain);
+  const auto replaced = [](std::string text, std::size_t at, const char *with) {
+    return text.replace(at, std::string(with).size(), with);
+  };
   for (const std::string &thumbprint :
-       {plain.substr(1), plain + "0", colons.substr(1), colons + ":", ":" + colons, colons.substr(0, 92) + "00",
-        "2e9:df5d" + colons.substr(8), "2e:9ddf5d" + plain.substr(8), ":" + plain, plain + ":", "g" + plain.substr(1),
-        "'" + plain.substr(1) + " '", colons.substr(0, 2) + "-" + colons.substr(3), std::string(95, ':'),
+       {plain.substr(1), plain + "0", colons.substr(1), colons + ":", ":" + colons, replaced(colons, 92, "00"),
+        replaced(colons, 0, "2e9:df5d"), replaced(plain, 0, "2e:9ddf5"), ":" + plain, plain + ":",
+        replaced(plain, 0, "g"), "'" + plain.substr(1) + " '", replaced(colons, 2, "-"), std::string(95, ':'),
         std::string(64, ':'), std::string(95, '0')}) {
     SCOPED_TRACE(thumbprint);
     ExpectResult(RunShell("ssoclient validate " STS "--thumbprint " + thumbprint + " bearer.xml"), 2, "",

@@ -16,7 +16,7 @@ const OutputOptions OUTPUT;
 
 TEST(AskForToken, GivesTheTokenOfTheCall) {
   const auto token = std::make_shared<const Testing::TokenStandIn>("_1", "<a/>", SamlToken::BEARER);
-  EXPECT_EQ(token, AskForToken([&] { return token; }, nullptr, OUTPUT).token);
+  EXPECT_EQ(token, AskForToken([&]() -> std::shared_ptr<const SamlToken> { return token; }, nullptr, OUTPUT).token);
 }
 
 TEST(AskForToken, RefusesAResponseThatHoldsNoToken) {

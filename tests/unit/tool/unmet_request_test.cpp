@@ -32,6 +32,7 @@ TokenFacts HourFrom(const char *start = "2026-01-01T12:00:00Z", const char *end 
 
 std::vector<std::string> KeysOf(const std::vector<UnmetRequest> &unmet) {
   std::vector<std::string> keys;
+  keys.reserve(unmet.size());
   for (const UnmetRequest &request : unmet) {
     keys.emplace_back(request.key);
   }
