@@ -36,14 +36,15 @@ namespace SsoClient {
 ///   left to wait for it; a later call tries again,
 /// - `Tarvel::Xml::Security::XmlSecurityException` for an identity whose key cannot sign with RSA-SHA256 (an EC key),
 /// - `Tarvel::Xml::Security::XmlSecurityException` or `Tarvel::Xml::XMLParseException` for an assertion in the response
-///   that cannot be taken out of it as a document of its own.
+///   that cannot be taken out of it as a document of its own,
 /// - `Tarvel::OutOfMemoryException`, and `Tarvel::InvalidStateException` when OpenSSL has cleaned itself up because the process
 ///   ends, where a token or a request was in hand; on the way to the service and back, both are `CommunicationException`.
-/// All of them are `Tarvel::Exception`. Nothing is tried again. A token that is returned is never null.
+/// All of them are `Tarvel::Exception`. Nothing is tried again. A token that is returned is null only when the response
+/// holds an empty text in its place.
 class SSOCLIENT_API SecurityTokenService {
 public:
-  /// Told once how an operation ended: with the token and null, or with null and the exception, which is good during the
-  /// call only (`Clone` keeps it).
+  /// Told once how an operation ended: with the token (null as above) and null, or with null and the exception, which is
+  /// good during the call only (`Clone` keeps it).
   using TokenCompletion =
       std::function<void(const std::shared_ptr<const SamlToken> &token, const Tarvel::Exception *failure)>;
 

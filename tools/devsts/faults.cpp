@@ -70,6 +70,8 @@ constexpr NamedFault NAMED[] = {
     {"no-subject", OfToken(TokenFault::NO_SUBJECT)},
     {"unknown-element", OfToken(TokenFault::UNKNOWN_ELEMENT)},
     {"wrong-version", OfToken(TokenFault::WRONG_VERSION)},
+    {"plain-token", OfToken(TokenFault::PLAIN)},
+    {"short-lived-token", OfToken(TokenFault::SHORT_LIVED)},
     {"doctype", OfDocument(DocumentFault::DOCTYPE)},
     {"too-deep", OfDocument(DocumentFault::TOO_DEEP)},
     {"soap-fault-without-text", OfDocument(DocumentFault::SOAP_FAULT_WITHOUT_TEXT)},
@@ -282,6 +284,16 @@ void SpoilFacts(TokenFacts &facts, TokenFault fault) {
     return;
   case TokenFault::BEARER:
     facts.certificate.clear();
+    return;
+  case TokenFault::PLAIN: // whatever was asked for
+    facts.delegation.clear();
+    facts.audience.clear();
+    facts.advice.clear();
+    facts.renewals = 0;
+    facts.delegations = 0;
+    return;
+  case TokenFault::SHORT_LIVED:
+    facts.notOnOrAfter = facts.notBefore + life / 2;
     return;
   default:
     return;

@@ -27,6 +27,8 @@ enum class TokenFault {
   NO_SUBJECT,
   UNKNOWN_ELEMENT,
   WRONG_VERSION,
+  PLAIN,
+  SHORT_LIVED,
 };
 
 /// What is wrong with the document that is answered.

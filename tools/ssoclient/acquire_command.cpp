@@ -37,10 +37,10 @@ ExitCode Acquire(const AcquireOptions &options, const OutputOptions &output) {
 
   const Tarvel::Crypto::CertificateList trusted = LoadTrusted(options.trust, output);
   const auto connection = CreateConnection(options.connection, trusted, LoadIdentity(options.identity));
-  const auto token = kind.acquire(
-      {*connection.service, spec, options.credentials, options.connection.url, trusted, options.trust.toleranceSec});
-  RequireWithinTolerance(*token, trusted, options.trust.toleranceSec);
-  WriteToken(*token, options.tokenOutput, output);
+  const IssuedToken issued = kind.acquire({*connection.service, spec, hasIdentity, options.credentials,
+                                           options.connection.url, trusted, options.trust.toleranceSec, output});
+  RequireWithinTolerance(*issued.token, trusted, options.trust.toleranceSec);
+  WriteToken(issued, spec, options.trust.toleranceSec, options.tokenOutput, output);
   return ExitCode::DONE;
 }
 

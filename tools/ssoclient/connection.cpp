@@ -8,22 +8,32 @@
 #include <ssoclient/security_token_service_config.h>
 #include <tarvel/http/url.h>
 
-#include <algorithm>
 #include <cstddef>
 
 namespace SsoClient::Tool {
 namespace {
 
 constexpr const char *GROUP = "Service";
-constexpr std::ptrdiff_t THUMBPRINT_DIGITS = 64;
+constexpr std::size_t THUMBPRINT_DIGITS = 64;
+constexpr std::size_t THUMBPRINT_WITH_COLONS = THUMBPRINT_DIGITS + THUMBPRINT_DIGITS / 2 - 1;
 
 bool IsHexDigit(char c) {
   return (c >= '0' && c <= '9') || (c >= 'a' && c <= 'f') || (c >= 'A' && c <= 'F');
 }
 
+/// Whether the handshake will take `text` for a thumbprint: it has a colon after every two digits, or none.
 bool IsThumbprint(const std::string &text) {
-  const bool isHex = std::all_of(text.begin(), text.end(), [](char c) { return c == ':' || IsHexDigit(c); });
-  return isHex && std::count_if(text.begin(), text.end(), IsHexDigit) == THUMBPRINT_DIGITS;
+  const bool hasColons = text.size() == THUMBPRINT_WITH_COLONS;
+  if (!hasColons && text.size() != THUMBPRINT_DIGITS) {
+    return false;
+  }
+  for (std::size_t i = 0; i < text.size(); ++i) {
+    const bool isColonsPlace = hasColons && i % 3 == 2;
+    if (isColonsPlace ? text[i] != ':' : !IsHexDigit(text[i])) {
+      return false;
+    }
+  }
+  return true;
 }
 
 bool IsSecure(const std::string &url) {
@@ -54,7 +64,9 @@ void AddConnectionOptions(CLI::App &app, ConnectionOptions &options) {
 
 void CheckConnection(const ConnectionOptions &options) {
   if (!options.thumbprint.empty() && !IsThumbprint(options.thumbprint)) {
-    throw UsageException("--thumbprint wants the 64 hexadecimal digits of a SHA-256 digest; colons may stand between");
+    throw UsageException(
+        "--thumbprint must be the 64 hexadecimal digits of a SHA-256 digest, with a colon after every two of "
+        "them or with none");
   }
   if (IsSecure(options.url)) {
     return;

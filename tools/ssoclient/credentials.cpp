@@ -10,12 +10,28 @@ namespace {
 
 constexpr const char *GROUP = "Credentials";
 
+constexpr Doubt DELEGATION_WITHOUT_PROOF = {
+    "with --delegate-to, a token is asked for that is bound to the identity's key, but without proof of the key, which "
+    "services refuse",
+    "give --bearer, too: with --user or --gss, a token for --delegate-to cannot be bound to a key"};
+
+constexpr Doubt EXCHANGE_OF_BEARER_TOKEN = {
+    "the token to exchange is a bearer token, whose exchange services refuse",
+    "an exchange needs a holder-of-key token; acquire one with the identity, and without --bearer"};
+
+/// The request for a delegated token is not signed, whatever kind of token it asks for.
+const Doubt *DoubtAboutDelegation(const AcquireCall &call) {
+  const bool asksForBoundToken = call.hasIdentity && call.spec.confirmation == TokenSpec::CONFIRMATION_DEFAULT;
+  return asksForBoundToken && call.spec.delegateTo ? &DELEGATION_WITHOUT_PROOF : nullptr;
+}
+
 void CheckNothing(const TokenSpec &, bool) {}
 
-std::shared_ptr<const SamlToken> AcquireByPassword(const AcquireCall &call) {
+IssuedToken AcquireByPassword(const AcquireCall &call) {
   const CredentialsOptions &credentials = call.credentials;
   const Secret password = ReadSecret(credentials.password, "Password for " + credentials.user + ": ");
-  return call.service.AcquireToken(credentials.user, password.Get(), call.spec);
+  return AskForToken([&] { return call.service.AcquireToken(credentials.user, password.Get(), call.spec); },
+                     DoubtAboutDelegation(call), call.output);
 }
 
 void CheckExchange(const TokenSpec &, bool hasIdentity) {
@@ -24,17 +40,20 @@ void CheckExchange(const TokenSpec &, bool hasIdentity) {
   }
 }
 
-std::shared_ptr<const SamlToken> AcquireByToken(const AcquireCall &call) {
+IssuedToken AcquireByToken(const AcquireCall &call) {
   const auto given = ReadToken(call.credentials.tokenFile, call.trusted, call.toleranceSec);
-  return call.service.AcquireTokenByToken(*given, call.spec);
+  // The request's signature names the token for its key, and a bearer token has none.
+  const Doubt *const doubt = given->GetConfirmationMethod() == SamlToken::BEARER ? &EXCHANGE_OF_BEARER_TOKEN : nullptr;
+  return AskForToken([&] { return call.service.AcquireTokenByToken(*given, call.spec); }, doubt, call.output);
 }
 
 void CheckGss(const TokenSpec &, bool) {
   RequireGss();
 }
 
-std::shared_ptr<const SamlToken> AcquireByTicket(const AcquireCall &call) {
-  return AcquireByGss(call.service, call.spec, call.credentials.gss, call.url);
+IssuedToken AcquireByTicket(const AcquireCall &call) {
+  return AskForToken([&] { return AcquireByGss(call.service, call.spec, call.credentials.gss, call.url); },
+                     DoubtAboutDelegation(call), call.output);
 }
 
 void CheckCertificate(const TokenSpec &spec, bool) {
@@ -43,8 +62,8 @@ void CheckCertificate(const TokenSpec &spec, bool) {
   }
 }
 
-std::shared_ptr<const SamlToken> AcquireByCertificate(const AcquireCall &call) {
-  return call.service.AcquireTokenByCertificate(call.spec);
+IssuedToken AcquireByCertificate(const AcquireCall &call) {
+  return AskForToken([&] { return call.service.AcquireTokenByCertificate(call.spec); }, nullptr, call.output);
 }
 
 constexpr CredentialsKind CHOSEN_KINDS[] = {

@@ -7,14 +7,13 @@
 #include "gss_credentials.h"
 #include "input_descriptor.h"
 #include "secret_input.h"
+#include "service_call.h"
 #include "trust.h"
 
-#include <ssoclient/saml_token.h>
 #include <ssoclient/security_token_service.h>
 #include <ssoclient/token_spec.h>
 
 #include <cstdint>
-#include <memory>
 #include <string>
 
 namespace CLI {
@@ -34,10 +33,12 @@ struct CredentialsOptions {
 struct AcquireCall {
   const SecurityTokenService &service;
   const TokenSpec &spec;
+  bool hasIdentity;
   const CredentialsOptions &credentials;
   const std::string &url; ///< of the service
   const Tarvel::Crypto::CertificateList &trusted;
   std::int64_t toleranceSec;
+  const OutputOptions &output;
 };
 
 /// One row of the table of kinds.
@@ -49,7 +50,7 @@ struct CredentialsKind {
   void (*check)(const TokenSpec &spec, bool hasIdentity);
 
   /// Reads what the kind needs, and asks the service.
-  std::shared_ptr<const SamlToken> (*acquire)(const AcquireCall &call);
+  IssuedToken (*acquire)(const AcquireCall &call);
 };
 
 void AddCredentialsOptions(CLI::App &app, CredentialsOptions &options);

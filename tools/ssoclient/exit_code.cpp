@@ -34,6 +34,7 @@ constexpr Meaning MEANINGS[] = {
     {ExitCode::SIGNATURE_INVALID, "signature invalid"},
     {ExitCode::FILE_OR_KEY, "a file, key, certificate or passphrase"},
     {ExitCode::SERVICE_FAULT, "any other failure that the service reports"},
+    {ExitCode::OUTPUT_LOST, "the token is in its file, but standard output failed"},
     {ExitCode::INTERRUPTED, "interrupted"},
 };
 
@@ -50,6 +51,7 @@ struct Row {
 // The first row that matches counts, so a class stands above its base.
 constexpr Row TABLE[] = {
     {IsA<UsageException>, {ExitCode::USAGE, "UsageException", "usage"}},
+    {IsA<OutputException>, {ExitCode::OUTPUT_LOST, "OutputException", "output"}},
 #ifdef SSOCLIENT_TOOL_HAS_GSSAPI
     {IsA<Gssapi::GssCredentialException>, {ExitCode::CREDENTIALS_REFUSED, "GssCredentialException", "credentials"}},
     {IsA<Gssapi::GssLimitException>, {ExitCode::COMMUNICATION, "GssLimitException", "communication failed"}},
@@ -93,6 +95,9 @@ std::string ExitCodeHelp() {
 }
 
 Failure Classify(const std::exception &failure) noexcept {
+  if (const auto *const hinted = dynamic_cast<const HintedException *>(&failure)) {
+    return hinted->GetFailure();
+  }
   for (const Row &row : TABLE) {
     if (row.matches(failure)) {
       return row.failure;

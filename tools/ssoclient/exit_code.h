@@ -21,6 +21,7 @@ enum class ExitCode : int {
   SIGNATURE_INVALID = 6,
   FILE_OR_KEY = 7,
   SERVICE_FAULT = 8,
+  OUTPUT_LOST = 9,
   INTERRUPTED = 130,
 };
 
@@ -29,6 +30,12 @@ std::string ExitCodeHelp();
 
 /// A command line that the tool cannot act on.
 class UsageException : public std::runtime_error {
+public:
+  using std::runtime_error::runtime_error;
+};
+
+/// Standard output that could not be written, after a token was put into its file.
+class OutputException : public std::runtime_error {
 public:
   using std::runtime_error::runtime_error;
 };
@@ -42,5 +49,19 @@ struct Failure {
 
 /// Looks `failure` up in the one table of failures.
 Failure Classify(const std::exception &failure) noexcept;
+
+/// A failure with what its text does not say: what the caller may do about it. It means what the failure means.
+class HintedException : public std::runtime_error {
+public:
+  HintedException(const std::exception &failure, const std::string &hint)
+      : std::runtime_error(failure.what()), m_failure(Classify(failure)), m_hint(hint) {}
+
+  const Failure &GetFailure() const noexcept { return m_failure; }
+  const std::string &GetHint() const noexcept { return m_hint; }
+
+private:
+  Failure m_failure;
+  std::string m_hint;
+};
 
 } // namespace SsoClient::Tool

@@ -5,16 +5,20 @@
 #include "command.h"
 #include "exit_code.h"
 #include "interruption.h"
+#include "option.h"
 #include "standard_streams.h"
 
 #include <tarvel/crypto/system_configuration.h>
 
 #include <CLI/CLI.hpp>
 
+#include <algorithm>
 #include <exception>
 #include <map>
 #include <string>
 #include <string_view>
+#include <utility>
+#include <vector>
 
 namespace SsoClient::Tool {
 namespace {
@@ -63,29 +67,62 @@ Format RequestedFormat(int argc, char **argv) {
   return Format::TEXT;
 }
 
-/// What the command `app` has no place for: its unknown options, or else its arguments. What stands behind an unknown option
-/// is left out, for it may be a secret that somebody tried to give there.
-std::string DescribeExtras(const CLI::App &app) {
-  std::string options;
-  std::string arguments;
-  for (const std::string &extra : app.remaining()) {
-    if (extra.size() > 1 && extra.front() == '-') {
-      options += " " + extra.substr(0, extra.find('='));
-    } else {
-      arguments += " " + extra;
+/// Whether `argument` is of the form "--name=".
+bool HasEmptyValue(const std::string &argument) {
+  return argument.size() > 3 && argument.compare(0, 2, "--") == 0 && argument.find('=') == argument.size() - 1;
+}
+
+/// The arguments of the process as the parser wants them: the last one first. "--name=" is taken apart, for the parser would
+/// drop the empty text, and take the next argument in its place.
+std::vector<std::string> ReadArguments(int argc, char **argv) {
+  std::vector<std::string> arguments;
+  bool mayBeOption = true;
+  for (int i = 1; i < argc; ++i) {
+    std::string argument = argv[i];
+    mayBeOption = mayBeOption && argument != "--";
+    const bool isEmptied = mayBeOption && HasEmptyValue(argument);
+    if (isEmptied) {
+      argument.pop_back();
+    }
+    arguments.push_back(std::move(argument));
+    if (isEmptied) {
+      arguments.emplace_back();
     }
   }
-  return "not expected:" + (options.empty() ? arguments : options);
+  std::reverse(arguments.begin(), arguments.end());
+  return arguments;
+}
+
+bool IsOption(const std::string &argument) {
+  return argument.size() > 1 && argument.front() == '-';
+}
+
+/// The name of the option in `argument`. What is joined to it is left out, for it may be a secret.
+std::string OptionName(const std::string &argument) {
+  return argument.compare(0, 2, "--") == 0 ? argument.substr(0, argument.find('=')) : argument.substr(0, 2);
+}
+
+/// What the command line has no place for: the first unknown option, or else an argument. What follows the option, and
+/// the argument itself, are left out: somebody may have tried to give a secret there.
+std::string DescribeExtras(const std::vector<std::string> &extras) {
+  const auto option = std::find_if(extras.begin(), extras.end(), IsOption);
+  return option == extras.end() ? "too many arguments" : "not expected: " + OptionName(*option);
 }
 
 std::string Explain(const CLI::App &app, const CLI::ParseError &error) {
-  if (app.get_subcommands().empty() && !app.remaining().empty()) {
-    return "unknown command or option '" + app.remaining().front() + "'";
+  const std::vector<std::string> extras = app.remaining(true);
+  if (app.get_subcommands().empty() && !extras.empty()) {
+    const std::string &first = extras.front();
+    return "unknown command or option '" + (IsOption(first) ? OptionName(first) : first) + "'";
   }
   if (dynamic_cast<const CLI::ExtrasError *>(&error)) {
-    return DescribeExtras(*app.get_subcommands().front());
+    return DescribeExtras(extras);
   }
-  return error.what();
+  std::string message = error.what();
+  if (dynamic_cast<const CLI::ConversionError *>(&error)) {
+    return message.substr(0, message.find(" = ")); // without the value
+  }
+  return message;
 }
 
 void AddOutputOptions(CLI::App &app, OutputOptions &output) {
@@ -94,11 +131,12 @@ void AddOutputOptions(CLI::App &app, OutputOptions &output) {
   app.add_option_function<std::string>(
          "--format", [&output](const std::string &name) { output.format = FORMATS.at(name); },
          "How to write the result; xml is the token itself")
+      ->check(RefuseEmpty)
       ->check(CLI::IsMember({"text", "json", "xml"}))
       ->default_str("text")
       ->type_name("FORMAT");
-  app.add_flag("-v,--verbose", output.verbose,
-               "Write the library's log lines to standard error, and warnings whatever the format");
+  AddFlag(app, "-v,--verbose", output.verbose,
+          "Write the library's log lines to standard error, and warnings also when the format is json");
 }
 
 int Run(int argc, char **argv) {
@@ -121,7 +159,7 @@ int Run(int argc, char **argv) {
   }
 
   try {
-    app.parse(argc, argv);
+    app.parse(ReadArguments(argc, argv));
   } catch (const CLI::Success &success) { // --help and --version
     return app.exit(success);
   } catch (const CLI::ParseError &error) {

@@ -4,7 +4,46 @@
 
 #include <CLI/CLI.hpp>
 
+#include <charconv>
+#include <system_error>
+
 namespace SsoClient::Tool {
+namespace {
+
+/// Replaces the decimal number in `argument` by its shortest form; what is wrong with it, or nothing.
+std::string NormaliseNumber(std::string &argument) {
+  if (argument.empty()) {
+    return RefuseEmpty(argument);
+  }
+  std::int64_t number = 0;
+  const char *const end = argument.data() + argument.size();
+  const auto [parsed, error] = std::from_chars(argument.data(), end, number);
+  if (parsed != end || error == std::errc::invalid_argument) {
+    return "must be a whole number";
+  }
+  if (error != std::errc()) {
+    return "is out of range";
+  }
+  argument = std::to_string(number);
+  return {};
+}
+
+/// What is wrong with the "true" that the parser stores for a flag, or with a text that was joined to the flag by "=".
+std::string RefuseArgument(const std::string &argument) {
+  return argument == "true" ? "" : "takes no argument";
+}
+
+Option AddNumber(CLI::Option &option) {
+  // Without this, a leading 0 would make the number octal.
+  option.transform(CLI::Validator(NormaliseNumber, ""));
+  return Option(option);
+}
+
+} // namespace
+
+std::string RefuseEmpty(const std::string &argument) {
+  return argument.empty() ? "must not be empty" : "";
+}
 
 Option Option::Required() const {
   m_option->required();
@@ -26,8 +65,14 @@ Option Option::ShowDefault() const {
   return *this;
 }
 
-Option Option::Within(int least, int most) const {
-  m_option->check(CLI::Range(least, most));
+Option Option::Within(std::int64_t least, std::int64_t most) const {
+  m_option->check([least, most](const std::string &argument) -> std::string {
+    const std::int64_t number = std::stoll(argument); // a number in its shortest form
+    if (least <= number && number <= most) {
+      return {};
+    }
+    return "must be a number from " + std::to_string(least) + " to " + std::to_string(most);
+  });
   return *this;
 }
 
@@ -42,24 +87,31 @@ Option Option::Excludes(const Option &other) const {
 }
 
 Option AddOption(CLI::App &command, const std::string &name, std::string &value, const std::string &help) {
-  return Option(*command.add_option(name, value, help));
+  return Option(*command.add_option(name, value, help)->check(RefuseEmpty));
 }
 
 Option AddOption(CLI::App &command, const std::string &name, int &value, const std::string &help) {
-  return Option(*command.add_option(name, value, help));
+  return AddNumber(*command.add_option(name, value, help));
 }
 
 Option AddOption(CLI::App &command, const std::string &name, std::int64_t &value, const std::string &help) {
-  return Option(*command.add_option(name, value, help));
+  return AddNumber(*command.add_option(name, value, help));
 }
 
 Option AddOption(CLI::App &command, const std::string &name, std::vector<std::string> &values,
                  const std::string &help) {
-  return Option(*command.add_option(name, values, help)->allow_extra_args(false));
+  // The arguments as they are: a conversion to a vector would take "{}" and "%%" for signs of its own.
+  const auto take = [&values](const CLI::results_t &arguments) {
+    values = arguments;
+    return true;
+  };
+  CLI::Option *const option = command.add_option(name, take, help);
+  option->expected(1, CLI::detail::expected_max_vector_size)->allow_extra_args(false)->check(RefuseEmpty);
+  return Option(*option);
 }
 
 Option AddFlag(CLI::App &command, const std::string &name, bool &value, const std::string &help) {
-  return Option(*command.add_flag(name, value, help));
+  return Option(*command.add_flag(name, value, help)->check(RefuseArgument));
 }
 
 } // namespace SsoClient::Tool

@@ -31,7 +31,7 @@ public:
   /// The help shows what the option's variable holds now.
   Option ShowDefault() const;
   /// The argument is a number from `least` to `most`.
-  Option Within(int least, int most) const;
+  Option Within(std::int64_t least, std::int64_t most) const;
   /// A command line with this option and without `other` is wrong.
   Option Needs(const Option &other) const;
   /// A command line with both options is wrong.
@@ -41,8 +41,13 @@ private:
   CLI::Option *m_option;
 };
 
+/// What is wrong with the argument of an option; empty for nothing. An empty argument is wrong everywhere: it is most often
+/// a shell's variable that is not set, and must not mean the same as an option that is not given.
+std::string RefuseEmpty(const std::string &argument);
+
 /// Adds an option with an argument that is stored in `value`, or a positional argument when `name` has no dashes.
-/// When it is not given, `value` keeps what it holds. `value` outlives the command.
+/// When it is not given, `value` keeps what it holds. `value` outlives the command. A number is decimal; what is not a
+/// number is refused without being repeated, since it may be a secret in the wrong place.
 Option AddOption(CLI::App &command, const std::string &name, std::string &value, const std::string &help);
 Option AddOption(CLI::App &command, const std::string &name, int &value, const std::string &help);
 Option AddOption(CLI::App &command, const std::string &name, std::int64_t &value, const std::string &help);

@@ -113,7 +113,10 @@ void WriteOutput(std::string_view text) {
   }
 }
 
-void Warn(std::string_view message) {
+void Warn(std::string_view message, const OutputOptions &output) {
+  if (output.format == Format::JSON && !output.verbose) {
+    return;
+  }
   const std::string line = "ssoclient: warning: " + PrintableLine(message) + "\n";
   std::fputs(line.c_str(), stderr);
 }
@@ -127,14 +130,21 @@ void ShowLibraryLog() {
 
 void ReportFailure(const std::exception &failure, Format format) {
   const Failure known = Classify(failure);
-  std::string line;
+  const auto *const hinted = dynamic_cast<const HintedException *>(&failure);
+  std::string lines;
   if (format == Format::JSON) {
-    line = Json({{"schema", 1}, {"error", {{"class", known.className}, {"message", failure.what()}}}});
+    nlohmann::ordered_json json = {{"schema", 1}, {"error", {{"class", known.className}, {"message", failure.what()}}}};
+    if (hinted) {
+      json["error"]["hint"] = hinted->GetHint();
+    }
+    lines = Json(json) + "\n";
   } else {
-    line = "ssoclient: " + std::string(known.label) + ": " + PrintableLine(failure.what());
+    lines = "ssoclient: " + std::string(known.label) + ": " + PrintableLine(failure.what()) + "\n";
+    if (hinted) {
+      lines += "ssoclient: hint: " + hinted->GetHint() + "\n";
+    }
   }
-  line += '\n';
-  std::fputs(line.c_str(), stderr);
+  std::fputs(lines.c_str(), stderr);
 }
 
 } // namespace SsoClient::Tool

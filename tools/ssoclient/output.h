@@ -34,13 +34,15 @@ std::string ReadInput(const std::string &path, std::size_t limit);
 /// @throws Tarvel::IOException when it cannot be written in full.
 void WriteOutput(std::string_view text);
 
-/// One line on standard error.
-void Warn(std::string_view message);
+/// One line on standard error. In JSON there is none unless the caller wants to see more: a program expects the failure's
+/// object there, and nothing else.
+void Warn(std::string_view message, const OutputOptions &output);
 
 /// From now on each line that the library logs goes to standard error, as a line of its own.
 void ShowLibraryLog();
 
-/// Tells of `failure` on standard error: one line of text, or one of JSON when that is the format.
+/// Reports `failure` on standard error: one line of text, and a second one for a hint, or one line of JSON when that is the
+/// format.
 void ReportFailure(const std::exception &failure, Format format);
 
 } // namespace SsoClient::Tool

@@ -5,11 +5,11 @@
 #include "command.h"
 #include "connection.h"
 #include "identity.h"
+#include "service_call.h"
 #include "token_output.h"
 #include "token_spec_options.h"
 #include "trust.h"
 
-#include <cstdint>
 #include <memory>
 #include <string>
 
@@ -26,7 +26,8 @@ struct RenewOptions {
 };
 
 ExitCode Renew(const RenewOptions &options, const OutputOptions &output) {
-  const std::int64_t lifetimeSec = ParseLifetime(options.lifetime);
+  TokenSpec spec; // what a renewal asks for is a lifetime alone
+  spec.tokenLifetimeSec = ParseLifetime(options.lifetime);
   if (!options.identity.IsGiven()) {
     throw UsageException("renewing needs the key that the token is bound to; give --cert and --key, or --p12");
   }
@@ -39,9 +40,10 @@ ExitCode Renew(const RenewOptions &options, const OutputOptions &output) {
   const Tarvel::Crypto::CertificateList trusted = LoadTrusted(options.trust, output);
   const auto given = ReadToken(options.file, trusted, options.trust.toleranceSec);
   const auto connection = CreateConnection(options.connection, trusted, LoadIdentity(options.identity));
-  const auto token = connection.service->RenewToken(*given, lifetimeSec);
-  RequireWithinTolerance(*token, trusted, options.trust.toleranceSec);
-  WriteToken(*token, options.tokenOutput, output);
+  const IssuedToken issued =
+      AskForToken([&] { return connection.service->RenewToken(*given, spec.tokenLifetimeSec); }, nullptr, output);
+  RequireWithinTolerance(*issued.token, trusted, options.trust.toleranceSec);
+  WriteToken(issued, spec, options.trust.toleranceSec, options.tokenOutput, output);
   return ExitCode::DONE;
 }
 

@@ -6,12 +6,24 @@
 #include "exit_code.h"
 #include "option.h"
 #include "token_report.h"
+#include "unmet_request.h"
+
+#include <tarvel/core/exception.h>
 
 namespace SsoClient::Tool {
 namespace {
 
 constexpr const char *GROUP = "Output";
 constexpr const char *STANDARD_OUTPUT = "-";
+
+/// Shows on standard output what the token in `file` says.
+void ShowBeside(const std::string &file, const std::string &text) {
+  try {
+    WriteOutput(text);
+  } catch (const Tarvel::IOException &failure) {
+    throw OutputException(file + " is written, but not what it says: " + failure.what());
+  }
+}
 
 } // namespace
 
@@ -33,18 +45,26 @@ void CheckTokenOutput(const TokenOutputOptions &options, const OutputOptions &ou
   }
 }
 
-void WriteToken(const SamlToken &token, const TokenOutputOptions &options, const OutputOptions &output) {
+void WriteToken(const IssuedToken &issued, const TokenSpec &spec, std::int64_t toleranceSec,
+                const TokenOutputOptions &options, const OutputOptions &output) {
+  TokenReport report = ReportOf(*issued.token);
+  report.unmet = FindUnmet(spec, issued.askedAt, report.facts, toleranceSec);
+  for (const UnmetRequest &request : *report.unmet) {
+    Warn("asked for, but not given by the service: " + request.wanted, output);
+  }
+
   if (options.file == STANDARD_OUTPUT) {
-    WriteOutput(Render(ReportOf(token), Format::XML));
+    WriteOutput(Render(report, Format::XML));
     return;
   }
-  if (!options.file.empty()) {
-    WriteFileWhole(options.file, Render(ReportOf(token), Format::XML), options.replace);
-    if (output.format == Format::XML) {
-      return;
-    }
+  if (options.file.empty()) {
+    WriteOutput(Render(report, output.format));
+    return;
   }
-  WriteOutput(Render(ReportOf(token), output.format));
+  WriteFileWhole(options.file, Render(report, Format::XML), options.replace);
+  if (output.format != Format::XML) {
+    ShowBeside(options.file, Render(report, output.format));
+  }
 }
 
 } // namespace SsoClient::Tool

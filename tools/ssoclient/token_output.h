@@ -5,9 +5,11 @@
 #pragma once
 
 #include "output.h"
+#include "service_call.h"
 
-#include <ssoclient/saml_token.h>
+#include <ssoclient/token_spec.h>
 
+#include <cstdint>
 #include <string>
 
 namespace CLI {
@@ -27,9 +29,12 @@ void AddTokenOutputOptions(CLI::App &app, TokenOutputOptions &options);
 /// @throws UsageException, Tarvel::IOException
 void CheckTokenOutput(const TokenOutputOptions &options, const OutputOptions &output);
 
-/// Puts the token's XML where the options say, and tells on standard output what the token says, unless that would be, or is
-/// already, the XML itself.
-/// @throws Tarvel::IOException
-void WriteToken(const SamlToken &token, const TokenOutputOptions &options, const OutputOptions &output);
+/// Warns of what `spec` asks for and the token does not have. Puts the token's XML where the options say, and shows on
+/// standard output what the token says, unless that would be, or is already, the XML itself.
+/// @param toleranceSec as for `FindUnmet`
+/// @throws Tarvel::IOException when the XML cannot be written.
+/// @throws OutputException when the XML is in its file, and standard output cannot be written.
+void WriteToken(const IssuedToken &issued, const TokenSpec &spec, std::int64_t toleranceSec,
+                const TokenOutputOptions &options, const OutputOptions &output);
 
 } // namespace SsoClient::Tool

@@ -72,6 +72,12 @@ std::string RenderJson(const TokenReport &report) {
     json["certificate"] = {{"subject", facts.confirmationCertificate->GetSubject()},
                            {"sha256", facts.confirmationCertificate->GetSha256Thumbprint()}};
   }
+  if (report.unmet) {
+    json["unmet"] = Json::array();
+    for (const UnmetRequest &request : *report.unmet) {
+      json["unmet"].push_back(request.key);
+    }
+  }
   // Everything beyond ASCII is escaped, so that a terminal shows the text and does not obey it.
   return json.dump(2, ' ', true);
 }

@@ -6,10 +6,14 @@
 
 #include "output.h"
 #include "token/token_facts.h"
+#include "unmet_request.h"
 
 #include <ssoclient/saml_token.h>
 
+#include <boost/optional.hpp>
+
 #include <string>
+#include <vector>
 
 namespace SsoClient::Tool {
 
@@ -18,6 +22,8 @@ struct TokenReport {
   bool verified = false;
   TokenFacts facts;
   std::string xml;
+  /// What was asked for and is not in the token; nothing for a token that was not asked for just now.
+  boost::optional<std::vector<UnmetRequest>> unmet;
 };
 
 /// The report of a verified token.

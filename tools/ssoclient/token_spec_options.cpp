@@ -47,7 +47,9 @@ AdviceText SplitAdvice(const std::string &text) {
     }
     plain += text[i];
   }
-  if (colon == std::string::npos || equals == std::string::npos || colon == 0 || equals == colon + 1) {
+  const bool isWhole = colon != std::string::npos && equals != std::string::npos;
+  // A token cannot have an empty value.
+  if (!isWhole || colon == 0 || equals == colon + 1 || equals + 1 == plain.size()) {
     throw UsageException("--advice '" + text + "' is not of the form SOURCE:NAME=VALUE");
   }
   return {plain.substr(0, colon), plain.substr(colon + 1, equals - colon - 1), plain.substr(equals + 1)};
@@ -97,14 +99,15 @@ std::int64_t ParseLifetime(std::string_view text) {
   const auto [end, error] = std::from_chars(text.data(), text.data() + text.size(), number);
   const std::size_t digits = static_cast<std::size_t>(end - text.data());
   const std::int64_t unit = UnitSeconds(text.substr(digits));
+  // No message repeats the text: it may be a secret in the wrong place.
   if ((error != std::errc() && error != std::errc::result_out_of_range) || digits == 0 || unit == 0) {
-    throw UsageException("--lifetime '" + std::string(text) + "' is not a number and s, m, h or d, as 8h");
+    throw UsageException("--lifetime must be a number and s, m, h or d, such as 8h");
   }
   if (error == std::errc() && number <= 0) {
-    throw UsageException("--lifetime '" + std::string(text) + "' is not positive");
+    throw UsageException("--lifetime must be positive");
   }
   if (error != std::errc() || number > MAX_LIFETIME_SEC / unit) {
-    throw UsageException("--lifetime '" + std::string(text) + "' is more than a hundred years");
+    throw UsageException("--lifetime must be at most a hundred years");
   }
   return number * unit;
 }

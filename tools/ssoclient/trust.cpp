@@ -10,7 +10,7 @@
 namespace SsoClient::Tool {
 namespace {
 
-void WarnOfDates(const Tarvel::Crypto::CertificateList &trusted) {
+void WarnOfDates(const Tarvel::Crypto::CertificateList &trusted, const OutputOptions &output) {
   const Tarvel::System::DateTime now = Tarvel::System::GetUtcDateTime();
   for (const auto &certificate : trusted) {
     std::string when;
@@ -21,7 +21,8 @@ void WarnOfDates(const Tarvel::Crypto::CertificateList &trusted) {
     } else {
       continue;
     }
-    Warn("the trusted certificate " + certificate->GetSubject() + " " + when + "; its key is trusted all the same");
+    Warn("the trusted certificate " + certificate->GetSubject() + " " + when + "; its key is trusted all the same",
+         output);
   }
 }
 
@@ -47,9 +48,7 @@ Tarvel::Crypto::CertificateList LoadTrusted(const TrustOptions &options, const O
     const Tarvel::Crypto::CertificateList some = Tarvel::Crypto::LoadCertificates(file);
     trusted.insert(trusted.end(), some.begin(), some.end());
   }
-  if (output.format == Format::TEXT || output.verbose) {
-    WarnOfDates(trusted);
-  }
+  WarnOfDates(trusted, output);
   return trusted;
 }
 

@@ -4,6 +4,7 @@
 
 #include "command.h"
 #include "connection.h"
+#include "service_call.h"
 #include "trust.h"
 
 #include <memory>
@@ -33,7 +34,8 @@ ExitCode Validate(const ValidateOptions &options, const OutputOptions &output) {
 
   const Tarvel::Crypto::CertificateList trusted = LoadTrusted(options.trust, output);
   const auto token = ReadToken(options.file, trusted, options.trust.toleranceSec);
-  const bool isValid = CreateConnection(options.connection, trusted, boost::none).service->ValidateSubject(*token);
+  const Connection connection = CreateConnection(options.connection, trusted, boost::none);
+  const bool isValid = CallService([&] { return connection.service->ValidateSubject(*token); });
   WriteOutput(RenderVerdict(isValid, output.format));
   return isValid ? ExitCode::DONE : ExitCode::TOKEN_INVALID;
 }

@@ -3,9 +3,12 @@
 
 #include "messages.h"
 
+#include <tarvel/system/date_time.h>
+
 #include <gmock/gmock.h>
 
 #include <chrono>
+#include <cstdint>
 
 namespace DevStsTest {
 namespace {
@@ -28,6 +31,15 @@ protected:
 
   Testing::DevSts m_service;
 };
+
+/// For how long the token in an answer is valid, in microseconds.
+std::int64_t LifetimeIn(const std::string &answer) {
+  const auto instant = [&](const std::string &name) {
+    return Tarvel::System::DateTime(Between(answer.substr(answer.find("<saml:Conditions ")), " " + name + "=\"", "\""))
+        .GetUtcTime();
+  };
+  return instant("NotOnOrAfter") - instant("NotBefore");
+}
 
 TEST_F(Faults, Documents) {
   EXPECT_THAT(Meet("no-token").body, HasSubstr("<wst:RequestedSecurityToken/>"));
@@ -65,6 +77,28 @@ TEST_F(Faults, Tokens) {
   EXPECT_EQ(
       TokenIn(Send(m_service, CertificateRequest(m_service), "/sts/fault/bearer-for-hok")).GetConfirmationMethod(),
       SsoClient::SamlToken::BEARER);
+}
+
+TEST_F(Faults, TokensThatDoNotHaveWhatWasAskedFor) {
+  SsoClient::TokenSpec spec = RenewableSpec();
+  spec.delegable = true;
+  spec.delegateTo = "bob@corp.example";
+  spec.audienceRestriction = {"https://mail.corp.example/"};
+  spec.advice = {{"audit", {{"by", {"alice"}}}}};
+  SsoClient::Request request;
+  BuilderFor(m_service, "").BuildUserPassTokenRequest("alice@corp.example", "wonderland", spec, request);
+  const std::string whole = Send(m_service, request).body;
+  const std::string plain = Send(m_service, request, "/sts/fault/plain-token").body;
+  for (const char *part : {"<del:Delegate ", "<saml:Audience>", "<rsa:RSAAdvice ",
+                           "<saml:ProxyRestriction Count=\"10\"", " Count=\"10\" Postdatable="}) {
+    EXPECT_THAT(whole, HasSubstr(part));
+    EXPECT_THAT(plain, Not(HasSubstr(part)));
+  }
+  EXPECT_THAT(plain, HasSubstr("<saml:AuthnStatement "));
+}
+
+TEST_F(Faults, TokensThatLastForHalfTheTime) {
+  EXPECT_EQ(LifetimeIn(Meet("short-lived-token").body) * 2, LifetimeIn(Send(m_service, PasswordRequest()).body));
 }
 
 TEST_F(Faults, SoapFaults) {

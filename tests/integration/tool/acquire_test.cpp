@@ -110,7 +110,8 @@ constexpr const char *EVERYTHING_JSON = R"({
       ]
     }
   ],
-  "certificate": null
+  "certificate": null,
+  "unmet": []
 }
 )";
 
@@ -139,7 +140,8 @@ constexpr const char *CLIENT_JSON = R"({
   "certificate": {
     "subject": "CN=client,O=corp.example",
     "sha256": "@SHA256@"
-  }
+  },
+  "unmet": []
 }
 )";
 

@@ -78,6 +78,19 @@ TEST_F(AcquireByTicket, AsksForTheKindOfTokenThatIsWanted) {
   EXPECT_THAT(result.out, HasSubstr("\nAudience:        https://files.corp.example/\n"));
 }
 
+TEST_F(AcquireByTicket, IsSentWithAWarningAndRefusedWithAHintForADelegatedTokenThatIsBoundToAKey) {
+  LogIn();
+  const std::string options = std::string(IDENTITY) + "--delegate-to bob@corp.example ";
+  ExpectResult(
+      AcquireWith(options), 8, "",
+      "ssoclient: warning: with --delegate-to, a token is asked for that is bound to the identity's key, but "
+      "without proof of the key, which services refuse\n"
+      "ssoclient: service fault: Unexpected SOAP fault: wst:InvalidRequest; request failed.\n"
+      "ssoclient: hint: give --bearer, too: with --user or --gss, a token for --delegate-to cannot be bound to "
+      "a key\n");
+  ExpectTokenOf("alice@corp.example", AcquireWith(options + "--bearer"));
+}
+
 TEST_F(AcquireByTicket, TakesTheServiceByItsHostOrAsAPrincipal) {
   LogIn();
   for (const char *service : {"HTTP@localhost", "HTTP/localhost", "HTTP/localhost@CORP.EXAMPLE"}) {

@@ -2,6 +2,7 @@
 // The manual tells what the help tells: the same options, the same exit codes.
 
 #include "built_files.h"
+#include "help_options.h"
 #include "process.h"
 #include "token_values.h"
 
@@ -25,32 +26,6 @@ std::string ReadManual() {
     text = Fill(text, font, "");
   }
   return Fill(text, "\\-", "-");
-}
-
-/// The long option, "--" included, at `at`, or behind a short one and `separator` there; empty for none.
-std::string OptionAt(const std::string &text, std::size_t at, const std::string &separator) {
-  const bool isShort = text[at] == '-' && text[at + 1] >= 'a' && text[at + 1] <= 'z';
-  if (isShort && text.compare(at + 2, separator.size(), separator) == 0) {
-    at += 2 + separator.size();
-  }
-  const std::size_t end = text.find_first_not_of("-0123456789abcdefghijklmnopqrstuvwxyz", at);
-  const std::string option = text.substr(at, end - at);
-  return option.find("--") == 0 && option != "--" ? option : "";
-}
-
-/// The options that the text has right behind `start`.
-std::set<std::string> OptionsBehind(const std::string &start, const std::string &text, const std::string &separator) {
-  std::set<std::string> options;
-  for (std::size_t at = text.find(start); at != std::string::npos; at = text.find(start, at + 1)) {
-    options.insert(OptionAt(text, at + start.size(), separator));
-  }
-  options.erase("");
-  return options;
-}
-
-/// The options that begin an indented line of a command's help.
-std::set<std::string> OptionsOfHelp(const std::string &command) {
-  return OptionsBehind("\n  ", RunTool({command, "--help"}).out, ",");
 }
 
 /// The options that the manual gives a paragraph of their own, in whatever fonts.

@@ -31,6 +31,9 @@ struct Refusal {
 #define STS "--sts https://127.0.0.1:9/sts --trust sts-rsa.crt "
 #define USAGE 2, "UsageException", "usage"
 #define SEE_HELP "; see ssoclient --help"
+#define THUMBPRINT_FORM                                                                                                \
+  "--thumbprint must be the 64 hexadecimal digits of a SHA-256 digest, with a colon after every two of them or with "  \
+  "none"
 
 const Refusal REFUSALS[] = {
     {"NoAddress", "acquire --trust sts-rsa.crt --user alice", USAGE, "--sts is required" SEE_HELP},
@@ -51,7 +54,36 @@ const Refusal REFUSALS[] = {
     {"TwoPasswords", "acquire " STS "--user alice --password-file pw --password-fd 3", USAGE,
      "--password-file excludes --password-fd" SEE_HELP},
     {"NegativeDescriptor", "acquire " STS "--user alice --password-fd -1", USAGE,
-     "--password-fd: Value -1 not in range 0 to 65535" SEE_HELP},
+     "--password-fd: must be a number from 0 to 65535" SEE_HELP},
+    {"DescriptorBeyondTheLast", "acquire " STS "--user alice --password-fd 65536", USAGE,
+     "--password-fd: must be a number from 0 to 65535" SEE_HELP},
+    {"DescriptorBeyondAllNumbers", "acquire " STS "--user alice --password-fd 99999999999999999999", USAGE,
+     "--password-fd: is out of range" SEE_HELP},
+    {"PasswordInPlaceOfItsDescriptor", "acquire " STS "--user alice --password-fd wonderland", USAGE,
+     "--password-fd: must be a whole number" SEE_HELP},
+    {"PasswordLikeAnOptionInPlaceOfItsDescriptor", "acquire " STS "--user alice --password-fd=--wonderland", USAGE,
+     "--password-fd: must be a whole number" SEE_HELP},
+    {"PasswordThatBeginsWithANumberInPlaceOfItsDescriptor", "acquire " STS "--user alice --password-fd 1wonderland",
+     USAGE, "--password-fd: must be a whole number" SEE_HELP},
+    {"PassphraseInPlaceOfItsDescriptor", "renew " STS "--p12 x.p12 --passphrase-fd wonderland full.xml", USAGE,
+     "--passphrase-fd: must be a whole number" SEE_HELP},
+    {"PasswordInPlaceOfTheTolerance", "acquire " STS "--user alice --tolerance wonderland", USAGE,
+     "--tolerance: must be a whole number" SEE_HELP},
+    {"HexadecimalTolerance", "acquire " STS "--user alice --tolerance 0x10", USAGE,
+     "--tolerance: must be a whole number" SEE_HELP},
+    {"PasswordJoinedToAFlag", "acquire " STS "--user alice --force=wonderland", USAGE,
+     "--force: takes no argument" SEE_HELP},
+    {"PasswordJoinedToTheCommonFlag", "acquire " STS "--user alice --verbose=wonderland", USAGE,
+     "--verbose: takes no argument" SEE_HELP},
+    {"PasswordAsAnArgument", "acquire " STS "--user alice wonderland", USAGE, "too many arguments" SEE_HELP},
+    {"PasswordJoinedToAShortOption", "acquire " STS "--user alice -pwonderland", USAGE, "not expected: -p" SEE_HELP},
+    {"PasswordBehindAShortOption", "acquire " STS "--user alice -p wonderland", USAGE, "not expected: -p" SEE_HELP},
+    {"PasswordLikeAnOptionOnTheCommandLine", "acquire " STS "--user alice --password --wonderland", USAGE,
+     "not expected: --password" SEE_HELP},
+    {"PasswordBeforeTheCommand", "--password=wonderland acquire " STS "--user alice", USAGE,
+     "not expected: --password" SEE_HELP},
+    {"PasswordWithoutACommand", "--password=wonderland", USAGE, "unknown command or option '--password'" SEE_HELP},
+    {"PasswordJoinedToAShortOptionWithoutACommand", "-pwonderland", USAGE, "unknown command or option '-p'" SEE_HELP},
     {"PasswordOnTheCommandLine", "acquire " STS "--user alice --password wonderland", USAGE,
      "not expected: --password" SEE_HELP},
     {"CertificateWithoutKey", "acquire " STS "--cert holder.crt", USAGE, "--cert requires --key" SEE_HELP},
@@ -71,24 +103,25 @@ const Refusal REFUSALS[] = {
     {"DescriptorTwice", "acquire " STS "--p12 x.p12 --passphrase-fd 3 --user alice --password-fd 3", USAGE,
      "--password-fd and --passphrase-fd cannot both read descriptor 3"},
     {"LifetimeOfNoNumber", "acquire " STS "--user alice --lifetime soon", USAGE,
-     "--lifetime 'soon' is not a number and s, m, h or d, as 8h"},
+     "--lifetime must be a number and s, m, h or d, such as 8h"},
     {"LifetimeOfAnUnknownUnit", "acquire " STS "--user alice --lifetime 8w", USAGE,
-     "--lifetime '8w' is not a number and s, m, h or d, as 8h"},
+     "--lifetime must be a number and s, m, h or d, such as 8h"},
     {"LifetimeOfAUnitAlone", "acquire " STS "--user alice --lifetime h", USAGE,
-     "--lifetime 'h' is not a number and s, m, h or d, as 8h"},
-    {"LifetimeOfZero", "acquire " STS "--user alice --lifetime 0h", USAGE, "--lifetime '0h' is not positive"},
-    {"NegativeLifetime", "renew " STS "--p12 x.p12 --lifetime=-1h token.xml", USAGE,
-     "--lifetime '-1h' is not positive"},
+     "--lifetime must be a number and s, m, h or d, such as 8h"},
+    {"LifetimeOfZero", "acquire " STS "--user alice --lifetime 0h", USAGE, "--lifetime must be positive"},
+    {"NegativeLifetime", "renew " STS "--p12 x.p12 --lifetime=-1h token.xml", USAGE, "--lifetime must be positive"},
     {"LifetimeBeyondACentury", "acquire " STS "--user alice --lifetime 36601d", USAGE,
-     "--lifetime '36601d' is more than a hundred years"},
+     "--lifetime must be at most a hundred years"},
     {"LifetimeBeyondAllNumbers", "acquire " STS "--user alice --lifetime 99999999999999999999s", USAGE,
-     "--lifetime '99999999999999999999s' is more than a hundred years"},
+     "--lifetime must be at most a hundred years"},
     {"AdviceWithoutSource", "acquire " STS "--user alice --advice color=green", USAGE,
      "--advice 'color=green' is not of the form SOURCE:NAME=VALUE"},
     {"AdviceOfAnEmptySource", "acquire " STS "--user alice --advice :color=green", USAGE,
      "--advice ':color=green' is not of the form SOURCE:NAME=VALUE"},
     {"AdviceOfAnEmptyName", "acquire " STS "--user alice --advice urn:a:=green", USAGE,
      "--advice 'urn:a:=green' is not of the form SOURCE:NAME=VALUE"},
+    {"AdviceOfAnEmptyValue", "acquire " STS "--user alice --advice urn:a:color=", USAGE,
+     "--advice 'urn:a:color=' is not of the form SOURCE:NAME=VALUE"},
     {"AdviceWithoutValue", "acquire " STS "--user alice --advice urn:a:color", USAGE,
      "--advice 'urn:a:color' is not of the form SOURCE:NAME=VALUE"},
     {"PlainHttp", "acquire --sts http://127.0.0.1:9/ --trust sts-rsa.crt --user alice", USAGE,
@@ -102,8 +135,7 @@ const Refusal REFUSALS[] = {
      "--ca and --thumbprint protect nothing on a plain http address"},
     {"AuthorityBesideThumbprint", "validate " STS "--ca sts-rsa.crt --thumbprint 00 bearer.xml", USAGE,
      "--ca excludes --thumbprint" SEE_HELP},
-    {"ThumbprintOfAnotherForm", "validate " STS "--thumbprint 00:11 bearer.xml", USAGE,
-     "--thumbprint wants the 64 hexadecimal digits of a SHA-256 digest; colons may stand between"},
+    {"ThumbprintOfAnotherForm", "validate " STS "--thumbprint 00:11 bearer.xml", USAGE, THUMBPRINT_FORM},
     {"AddressThatIsNone", "validate --sts sts.corp.example --trust sts-rsa.crt bearer.xml", 2, "MalformedURLException",
      "usage", "Malformed URL \"sts.corp.example\": the scheme is not http or https"},
     {"RenewalWithoutIdentity", "renew " STS "holder-of-key.xml", USAGE,
@@ -188,6 +220,45 @@ TEST(ServiceCommandLine, DoesNotMixTheTokenAndJsonOnStandardOutput) {
 TEST(ServiceCommandLine, ShowsNoSecretThatWasPutOnTheCommandLine) {
   ExpectResult(RunShell("ssoclient acquire " STS "--user alice --password=wonderland"), 2, "",
                "ssoclient: usage: not expected: --password; see ssoclient --help\n");
+  ExpectResult(RunShell("ssoclient --version=wonderland"), 2, "",
+               "ssoclient: usage: Could not convert: --version; see ssoclient --help\n");
+}
+
+constexpr const char *THUMBPRINT = "2e9ddf5d0000000000000000000000000000000000000000000000000000ABCD";
+
+std::string WithColons(const std::string &digits) {
+  std::string text = digits;
+  for (std::size_t at = 2; at < text.size(); at += 3) {
+    text.insert(at, ":");
+  }
+  return text;
+}
+
+TEST(Thumbprint, IsTakenWithAllColonsOrWithNone) {
+  const ClosedPort port;
+  for (const std::string &thumbprint : {std::string(THUMBPRINT), WithColons(THUMBPRINT)}) {
+    ExpectResult(RunShell("ssoclient validate --trust sts-rsa.crt --sts https://" + port.HostAndPort() +
+                          " --thumbprint " + thumbprint + " bearer.xml"),
+                 4, "",
+                 "ssoclient: communication failed: Cannot connect to " + port.HostAndPort() + ": Connection refused\n");
+  }
+}
+
+TEST(Thumbprint, OfAnyOtherFormIsAWrongCommandLine) {
+  const std::string plain = THUMBPRINT;
+  const std::string colons = WithColons(plain);
+  const auto replaced = [](std::string text, std::size_t at, const char *with) {
+    return text.replace(at, std::string(with).size(), with);
+  };
+  for (const std::string &thumbprint :
+       {plain.substr(1), plain + "0", colons.substr(1), colons + ":", ":" + colons, replaced(colons, 92, "00"),
+        replaced(colons, 0, "2e9:df5d"), replaced(plain, 0, "2e:9ddf5"), ":" + plain, plain + ":",
+        replaced(plain, 0, "g"), "'" + plain.substr(1) + " '", replaced(colons, 2, "-"), std::string(95, ':'),
+        std::string(64, ':'), std::string(95, '0')}) {
+    SCOPED_TRACE(thumbprint);
+    ExpectResult(RunShell("ssoclient validate " STS "--thumbprint " + thumbprint + " bearer.xml"), 2, "",
+                 "ssoclient: usage: " THUMBPRINT_FORM "\n");
+  }
 }
 
 TEST(ServiceCommandLine, AsksForNoVerdictInXml) {
@@ -201,8 +272,8 @@ TEST(Service, ThatCannotBeReachedEndsEachCommandWith4) {
   const std::string identity = "--cert holder.crt --key holder.key ";
   for (const std::string &line :
        {"acquire " + service + "--user alice --password-fd 5 5<sts-rsa.crt", "acquire " + service + identity,
-        "acquire " + service + identity + "--token bearer.xml", "renew " + service + identity + "holder-of-key.xml",
-        "validate " + service + "bearer.xml"}) {
+        "acquire " + service + identity + "--token holder-of-key.xml",
+        "renew " + service + identity + "holder-of-key.xml", "validate " + service + "bearer.xml"}) {
     ExpectResult(RunShell("ssoclient " + line), 4, "",
                  "ssoclient: communication failed: Cannot connect to " + port.HostAndPort() + ": Connection refused\n");
   }

@@ -86,6 +86,34 @@ TEST_F(TokenFile, IsNotThereWhenItCannotBeWrittenWhole) {
   EXPECT_EQ(m_before, m_folder.Names());
 }
 
+TEST_F(TokenFile, IsThereAndReportedSoWhenStandardOutputFails) {
+  const std::string line = "ssoclient acquire " + Service() + PASSWORD + "--out token.xml ";
+  const std::string full = "token.xml is written, but not what it says: standard output: No space left on device";
+  const std::string closed = "token.xml is written, but not what it says: standard output: Bad file descriptor";
+  ExpectResult(Run(line + ">/dev/full"), 9, "", "ssoclient: output: " + full + "\n");
+  EXPECT_TRUE(IsToken("token.xml"));
+  EXPECT_EQ(WithToken(), m_folder.Names());
+  ExpectResult(Run(line + "--force >&-"), 9, "", "ssoclient: output: " + closed + "\n");
+  ExpectResult(Run(line + "--force --format json >/dev/full"), 9, "",
+               R"({"schema":1,"error":{"class":"OutputException","message":")" + full + "\"}}\n");
+  EXPECT_TRUE(IsToken("token.xml"));
+}
+
+TEST_F(TokenFile, NeedsNoStandardOutputWhenTheFormatIsXml) {
+  for (const char *closed : {"--force >/dev/full", "--force >&-"}) {
+    ExpectResult(Run(Line() + closed), 0, "", "");
+    EXPECT_TRUE(IsToken("token.xml"));
+  }
+}
+
+TEST_F(TokenFile, IsNotThereWhenItWasToGoToAStandardOutputThatFails) {
+  for (const char *options : {"", "--out -", "--format xml", "--format json -v"}) {
+    const Result result = Run("ssoclient acquire " + Service() + PASSWORD + options + " >/dev/full");
+    EXPECT_EQ(7, result.exitCode) << options;
+  }
+  EXPECT_EQ(m_before, m_folder.Names());
+}
+
 TEST_F(TokenFile, StaysAsItWasWhenItCannotBeReplacedWhole) {
   m_folder.Write("token.xml", "what was there");
   EXPECT_EQ(7, Run("ulimit -f 1; " + Line() + "--force").exitCode);

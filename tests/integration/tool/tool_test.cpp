@@ -319,7 +319,7 @@ const Refusal REFUSALS[] = {
      2,
      "UsageException",
      "usage",
-     "Could not convert: --tolerance = 1x; see ssoclient --help"},
+     "--tolerance: must be a whole number; see ssoclient --help"},
     {"UnknownOption",
      {"--nope", "--trust", "sts-rsa.crt", "bearer.xml"},
      2,
@@ -461,6 +461,7 @@ TEST(Tool, ListsItsCommandsAndExitCodesInTheHelp) {
   6    signature invalid
   7    a file, key, certificate or passphrase
   8    any other failure that the service reports
+  9    the token is in its file, but standard output failed
   130  interrupted
 )"));
 }

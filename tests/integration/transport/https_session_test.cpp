@@ -186,6 +186,11 @@ TEST(HttpsSession, LetsTheStatusDecideBeforeTheCharset) {
   }
 }
 
+TEST(HttpsSession, EndsInABlankWhenTheReasonIsEmpty) {
+  ServiceStandIn service(AnswerWith("HTTP/1.1 404 \r\nContent-Length: 0\r\n\r\n"));
+  EXPECT_EQ(AskForOutcome(*service.CreateSession()), Failure("Server returned error: 404 "));
+}
+
 TEST(HttpsSession, PassesOverInterimResponses) {
   ServiceStandIn service(
       AnswerWith("HTTP/1.1 100 Continue\r\n\r\nHTTP/1.1 102 Processing\r\n\r\n" + Response("200 OK", "<body/>")));

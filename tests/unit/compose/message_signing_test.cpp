@@ -130,6 +130,29 @@ TEST_F(SignSoapMessageTest, KeepsAndReferencesAnIdentifierThatIsThereAlready) {
             (std::vector<std::string>{"#mine", "#Timestamp00000000-0000-4000-8000-000000000001"}));
 }
 
+TEST_F(SignSoapMessageTest, TakesNoElementOfAnotherNamespaceForTheOneThatItSigns) {
+  const XMLAttributes decoys = {{"xmlns:d", "urn:decoys"}};
+  const auto security =
+      std::make_shared<XMLCompositeBuilder>(ElementBuilder("wsse", "Security", {{"xmlns:wsse", WSSE_URI}}));
+  security->Add(ElementBuilder("d", "Timestamp", decoys)).Add(WssuTimestampBuilder(10));
+  const auto header = std::make_shared<XMLCompositeBuilder>(ElementBuilder("soapenv", "Header"));
+  header->Add(ElementBuilder("d", "Security", decoys)).Add(security);
+  const auto message =
+      std::make_shared<XMLCompositeBuilder>(ElementBuilder("soapenv", "Envelope", {{"xmlns:soapenv", SOAPENV_URI}}));
+  message->Add(ElementBuilder("d", "Header", decoys)).Add(ElementBuilder("d", "Body", decoys));
+  message->Add(header).Add(ElementBuilder("soapenv", "Body"));
+  ElementRef envelope;
+  message->build(envelope);
+
+  SignSoapMessage(*m_key, nullptr, envelope);
+  EXPECT_EQ(Attribute(Child(envelope.get(), SOAPENV_URI, "Body"), WSU_URI, "Id"),
+            "Body00000000-0000-4000-8000-000000000001");
+  EXPECT_EQ(Attribute(Child(Security(envelope), WSU_URI, "Timestamp"), WSU_URI, "Id"),
+            "Timestamp00000000-0000-4000-8000-000000000002");
+  EXPECT_EQ(LastChild(Security(envelope))->GetName(), "ds:Signature");
+  EXPECT_EQ(ReferenceUris(LastChild(Security(envelope))).size(), 2u);
+}
+
 TEST_F(SignSoapMessageTest, RefusesAMessageWithoutTheElementsThatASignatureNeeds) {
   EXPECT_THROWS_MESSAGE(Sign(nullptr), Tarvel::InvalidArgumentException,
                         "Invalid argument : the message to sign has no element 'Security' in 'soapenv:Header'");
@@ -171,6 +194,14 @@ TEST(CreateWssuId, IsTheLocalNameWithAUuidRightBehind) {
   EXPECT_EQ(CreateWssuId(element.get()), "Thing00000000-0000-4000-8000-000000000001");
   EXPECT_EQ(SerializeToXML(std::make_shared<const PreBuiltElementImpl>(element)),
             "<p:Thing" + Declare("wsu", WSU_URI) + " wsu:Id=\"Thing00000000-0000-4000-8000-000000000001\"></p:Thing>");
+}
+
+TEST(CreateWssuId, TakesNoIdOfAnotherNamespaceForIt) {
+  const FixedEnvironment environment;
+  ElementRef element;
+  ElementBuilder("p", "Thing", {{"Id", "mine"}, {"xmlns:q", "urn:q"}, {"q:Id", "theirs"}})->build(element);
+  EXPECT_EQ(CreateWssuId(element.get()), "Thing00000000-0000-4000-8000-000000000001");
+  EXPECT_NE(element->FindAttribute(WSU_URI, "Id"), nullptr);
 }
 
 } // namespace

@@ -56,6 +56,12 @@ TEST(AcquireSecurityTokenBuilder, EndsAHolderOfKeyRequestInUseKey) {
             PUBLIC_KEY_ISSUE + USE_KEY + END);
 }
 
+TEST(AcquireSecurityTokenBuilder, LeavesUseKeyOutForAConfirmationThatIsNeitherBearerNorHolderOfKey) {
+  const FixedEnvironment environment;
+  EXPECT_EQ(SerializeToXML(AcquireSecurityTokenBuilder(static_cast<SamlToken::ConfirmationType>(2), TenMinutes())),
+            PUBLIC_KEY_ISSUE + END);
+}
+
 TEST(AcquireSecurityTokenBuilder, WritesEveryOptionalPartInItsPlace) {
   const FixedEnvironment environment;
   TokenSpec spec = TenMinutes();

@@ -147,6 +147,15 @@ TEST_F(RequestBuilderImplTest, ABadLifetimeIsReportedBeforeAMissingIdentity) {
                         LIFETIME_MESSAGE);
 }
 
+TEST_F(RequestBuilderImplTest, ABadLifetimeIsReportedBeforeABadConfirmationOrToken) {
+  TokenSpec spec = BearerSpec();
+  spec.tokenLifetimeSec = 0;
+  EXPECT_THROWS_MESSAGE(m_withIdentity.BuildCertificateTokenRequest(spec, m_request), Tarvel::InvalidArgumentException,
+                        LIFETIME_MESSAGE);
+  EXPECT_THROWS_MESSAGE(m_withIdentity.BuildRenewRequest(BEARER_TOKEN, 0, m_request), Tarvel::InvalidArgumentException,
+                        LIFETIME_MESSAGE);
+}
+
 TEST_F(RequestBuilderImplTest, WithIdentityAUserNameRequestIsSignedAndAsksForHolderOfKey) {
   m_withIdentity.BuildUserPassTokenRequest("u", "p", Spec(), m_request);
   EXPECT_TRUE(IsSignedWithCertificate(m_request) && AsksForHolderOfKey(m_request)) << m_request.body;
@@ -155,6 +164,16 @@ TEST_F(RequestBuilderImplTest, WithIdentityAUserNameRequestIsSignedAndAsksForHol
 TEST_F(RequestBuilderImplTest, WithIdentityABearerUserNameRequestGoesUnsigned) {
   m_withIdentity.BuildUserPassTokenRequest("u", "p", BearerSpec(), m_request);
   EXPECT_TRUE(AsksForBearer(m_request) && !IsSigned(m_request)) << m_request.body;
+}
+
+TEST_F(RequestBuilderImplTest, WithIdentityABearerInitialSPNegoRequestGoesUnsigned) {
+  for (const int confirmation : {1, 7}) {
+    TokenSpec spec = Spec();
+    spec.confirmation = static_cast<TokenSpec::Confirmation>(confirmation);
+    m_withIdentity.BuildInitialSPNegoRequest(spec, LEG, m_request);
+    EXPECT_TRUE(AsksForBearer(m_request)) << m_request.body;
+    EXPECT_FALSE(IsSigned(m_request)) << m_request.body;
+  }
 }
 
 TEST_F(RequestBuilderImplTest, WithIdentityADelegatedRequestAsksForHolderOfKeyButGoesUnsigned) {
@@ -189,9 +208,13 @@ TEST_F(RequestBuilderImplTest, ADelegatedCertificateRequestIsSigned) {
 }
 
 TEST_F(RequestBuilderImplTest, ACertificateRequestRefusesAnotherConfirmation) {
-  EXPECT_THROWS_MESSAGE(
-      m_withIdentity.BuildCertificateTokenRequest(BearerSpec(), m_request), Tarvel::InvalidArgumentException,
-      "Invalid argument : TokenSpec::confirmation must be CONFIRMATION_DEFAULT for acquire token by certificate");
+  for (const int confirmation : {1, 2, -1}) {
+    TokenSpec spec = Spec();
+    spec.confirmation = static_cast<TokenSpec::Confirmation>(confirmation);
+    EXPECT_THROWS_MESSAGE(
+        m_withIdentity.BuildCertificateTokenRequest(spec, m_request), Tarvel::InvalidArgumentException,
+        "Invalid argument : TokenSpec::confirmation must be CONFIRMATION_DEFAULT for acquire token by certificate");
+  }
   EXPECT_THROWS_MESSAGE(m_plain.BuildCertificateTokenRequest(BearerSpec(), m_request), Tarvel::InvalidStateException,
                         "No HolderOfKeyConfig provided. Unable to acquire token by certificate");
 }
@@ -238,6 +261,28 @@ TEST_F(RequestBuilderImplTest, AFailureWhileComposingLeavesTheBodyAsItWas) {
                         "Specification mandates value for attribute xml at line 1, column 9");
   EXPECT_EQ(m_request.soapAction, Request::VALIDATE);
   EXPECT_EQ(m_request.body, "earlier");
+}
+
+TEST_F(RequestBuilderImplTest, SetsTheActionBeforeItComposesTheEnvelopeAndTheBodyAfterwards) {
+  // A key that cannot sign is noticed when the envelope is composed.
+  const RequestBuilderImpl builder(
+      HolderOfKeyConfig{Tarvel::Crypto::CreatePrivateKey(ReadDataFile("tokens/sts-ec256.key")),
+                        Tarvel::Crypto::CreateCertificateFromPem(ReadDataFile("tokens/sts-ec256.crt"))});
+  const auto expectActionAlone = [](const char *action, const auto &build) {
+    Request request;
+    request.body = "earlier";
+    EXPECT_THROW(build(request), Tarvel::Exception);
+    EXPECT_EQ(request.soapAction, action);
+    EXPECT_EQ(request.body, "earlier");
+  };
+  expectActionAlone(Request::ISSUE, [&](Request &out) { builder.BuildUserPassTokenRequest("u", "p", Spec(), out); });
+  expectActionAlone(Request::ISSUE, [&](Request &out) { builder.BuildInitialSPNegoRequest(Spec(), LEG, out); });
+  expectActionAlone(Request::CHALLANGE, [&](Request &out) { builder.BuildContinuedSPNegoRequest("\x01", LEG, out); });
+  expectActionAlone(Request::ISSUE, [&](Request &out) { builder.BuildCertificateTokenRequest(Spec(), out); });
+  expectActionAlone(Request::ISSUE, [&](Request &out) { builder.BuildExchangeTokenRequest(HOK_TOKEN, Spec(), out); });
+  expectActionAlone(Request::VALIDATE,
+                    [&](Request &out) { builder.BuildValidateSubjectRequest(UNPARSABLE_BEARER_TOKEN, out); });
+  expectActionAlone(Request::RENEW, [&](Request &out) { builder.BuildRenewRequest(HOK_TOKEN, 600, out); });
 }
 
 TEST_F(RequestBuilderImplTest, RefusesATextThatXmlCannotCarryWithoutQuotingThePassword) {

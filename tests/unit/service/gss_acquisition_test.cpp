@@ -74,6 +74,29 @@ TEST(AcquireTokenByGss, CarriesAllLegsOverOneSession) {
   EXPECT_EQ(acquisition.transport->CountOpenSessions(), 0);
 }
 
+/// Notes how many sessions there are when it is asked for a leg.
+class SessionCountingHandler final : public NegotiationHandler {
+public:
+  explicit SessionCountingHandler(const TransportStandIn &transport) : m_transport(transport) {}
+
+  std::shared_ptr<Bytes> NegotiateLeg(const Bytes &) override {
+    sessions.push_back(m_transport.CountSessions());
+    return Leg("c");
+  }
+
+  std::vector<int> sessions;
+
+private:
+  const TransportStandIn &m_transport;
+};
+
+TEST(AcquireTokenByGss, CreatesItsSessionBeforeItAsksForTheFirstLeg) {
+  const GssAcquisition acquisition({"leg:ctx|s1|", "leg:ctx||" + IssuedToken()});
+  SessionCountingHandler handler(*acquisition.transport);
+  acquisition.Acquire(handler);
+  EXPECT_EQ(handler.sessions, (std::vector<int>{1, 1}));
+}
+
 TEST(AcquireTokenByGss, SendsNothingWhenTheFirstLegIsNullAndLogsTheEndAllTheSame) {
   const Testing::FixedEnvironment environment;
   const RecordedLog log;

@@ -157,6 +157,13 @@ TEST(ValidateSubject, ReturnsTheVerdictOfTheService) {
   EXPECT_FALSE(no.service->ValidateSubject(CountingToken()));
 }
 
+TEST(ValidateSubject, ReleasesItsSessionBeforeTheResponseIsRead) {
+  const auto transport = std::make_shared<TransportStandIn>([](const Request &) { return std::string("valid:true"); });
+  int openSessions = -1;
+  ServiceOn(transport, [&] { openSessions = transport->CountOpenSessions(); })->ValidateSubject(CountingToken());
+  EXPECT_EQ(openSessions, 0);
+}
+
 TEST(ValidateSubject, LetsARefusalPassAsItIs) {
   const AnsweringService answering("fault:Authentication failed");
   EXPECT_THROWS_MESSAGE(answering.service->ValidateSubject(CountingToken()), InvalidCredentialsException,

@@ -1,0 +1,180 @@
+// SPDX-License-Identifier: Apache-2.0
+#include "unmet_request.h"
+
+#include <gmock/gmock.h>
+#include <gtest/gtest.h>
+
+#include <string>
+#include <vector>
+
+namespace SsoClient::Tool {
+namespace {
+
+using Tarvel::System::DateTime;
+using testing::ElementsAre;
+using testing::IsEmpty;
+
+const DateTime ASKED_AT("2026-01-01T12:00:00Z");
+
+TokenSpec SpecFor(std::int64_t lifetimeSec) {
+  TokenSpec spec;
+  spec.tokenLifetimeSec = lifetimeSec;
+  return spec;
+}
+
+/// A token that lasts for an hour from the moment on at which it was asked for.
+TokenFacts HourFrom(const char *start = "2026-01-01T12:00:00Z", const char *end = "2026-01-01T13:00:00Z") {
+  TokenFacts facts;
+  facts.startDate = DateTime(start);
+  facts.endDate = DateTime(end);
+  return facts;
+}
+
+std::vector<std::string> KeysOf(const std::vector<UnmetRequest> &unmet) {
+  std::vector<std::string> keys;
+  keys.reserve(unmet.size());
+  for (const UnmetRequest &request : unmet) {
+    keys.emplace_back(request.key);
+  }
+  return keys;
+}
+
+/// What is wanted and not there, for a token of an hour with these facts.
+std::vector<std::string> WantedOf(const TokenSpec &spec, const TokenFacts &facts) {
+  std::vector<std::string> wanted;
+  for (const UnmetRequest &request : FindUnmet(spec, ASKED_AT, facts, 0)) {
+    wanted.push_back(request.wanted);
+  }
+  return wanted;
+}
+
+TokenSpec SpecWithEverything() {
+  TokenSpec spec = SpecFor(7200);
+  spec.delegateTo = "bob@corp.example";
+  spec.renewable = true;
+  spec.delegable = true;
+  spec.advice = {{"audit", {{"by", {"alice"}}}}};
+  spec.audienceRestriction = {"https://mail.corp.example/"};
+  return spec;
+}
+
+TEST(FindUnmet, NamesEverythingThatIsNotThereInOneOrder) {
+  EXPECT_THAT(KeysOf(FindUnmet(SpecWithEverything(), ASKED_AT, HourFrom(), 0)),
+              ElementsAre("delegation", "renewable", "delegable", "advice", "audience", "lifetime"));
+  EXPECT_THAT(WantedOf(SpecWithEverything(), HourFrom()),
+              ElementsAre("delegation to bob@corp.example; the token is not delegated", "a renewable token",
+                          "a delegable token", "the advice audit:by=alice",
+                          "restriction to the audience https://mail.corp.example/; the token is not restricted",
+                          "a lifetime of 7200 seconds; the token ends at 2026-01-01T13:00:00.000Z"));
+}
+
+TEST(FindUnmet, NamesNothingWhenEverythingIsThere) {
+  TokenFacts facts = HourFrom("2026-01-01T12:00:00Z", "2026-01-01T14:00:00Z");
+  facts.delegationChain = {{{"bob", "corp.example"}, DateTime()}};
+  facts.renewable = true;
+  facts.delegable = true;
+  facts.advice = {{"audit", {{"by", {"alice"}}}}};
+  facts.audience = {"https://mail.corp.example/"};
+  EXPECT_THAT(FindUnmet(SpecWithEverything(), ASKED_AT, facts, 0), IsEmpty());
+}
+
+TEST(FindUnmet, LetsATokenHaveWhatWasNotAskedFor) {
+  TokenFacts facts = HourFrom("2026-01-01T12:00:00Z", "2026-01-02T12:00:00Z");
+  facts.delegationChain = {{{"bob", "corp.example"}, DateTime()}};
+  facts.renewable = true;
+  facts.delegable = true;
+  facts.advice = {{"audit", {{"by", {"alice"}}}}};
+  facts.audience = {"https://mail.corp.example/"};
+  EXPECT_THAT(FindUnmet(SpecFor(3600), ASKED_AT, facts, 0), IsEmpty());
+}
+
+TEST(FindUnmet, ComparesTheLastDelegateWithoutLetterCase) {
+  TokenSpec spec = SpecFor(3600);
+  spec.delegateTo = "Bob@CORP.example";
+  TokenFacts facts = HourFrom();
+  facts.delegationChain = {{{"gateway", "corp.example"}, DateTime()}, {{"bob", "corp.example"}, DateTime()}};
+  EXPECT_THAT(WantedOf(spec, facts), IsEmpty());
+  facts.delegationChain = {{{"bob", "corp.example"}, DateTime()}, {{"gateway", "corp.example"}, DateTime()}};
+  EXPECT_THAT(WantedOf(spec, facts),
+              ElementsAre("delegation to Bob@CORP.example; the token is delegated to gateway@corp.example"));
+  facts.delegationChain = {{{"bob", "other.example"}, DateTime()}};
+  EXPECT_THAT(WantedOf(spec, facts),
+              ElementsAre("delegation to Bob@CORP.example; the token is delegated to bob@other.example"));
+}
+
+TEST(FindUnmet, ComparesADelegateWithoutDomainByNameAlone) {
+  TokenSpec spec = SpecFor(3600);
+  spec.delegateTo = "bob";
+  TokenFacts facts = HourFrom();
+  facts.delegationChain = {{{"Bob", "corp.example"}, DateTime()}};
+  EXPECT_THAT(WantedOf(spec, facts), IsEmpty());
+  facts.delegationChain = {{{"bobby", "corp.example"}, DateTime()}};
+  EXPECT_THAT(WantedOf(spec, facts), ElementsAre("delegation to bob; the token is delegated to bobby@corp.example"));
+}
+
+TEST(FindUnmet, WantsEachValueOfEachAdviceInItsPlace) {
+  TokenSpec spec = SpecFor(3600);
+  spec.advice = {{"mapper", {{"color", {"green", "blue"}}, {"size", {"10"}}}}, {"audit", {{"by", {"alice"}}}}};
+  TokenFacts facts = HourFrom();
+  facts.advice = {{"audit", {{"by", {"bob", "alice"}}, {"color", {"blue"}}}},
+                  {"mapper", {{"size", {"green"}}, {"shape", {"10"}}}},
+                  {"mapper", {{"color", {"green"}}}}};
+  EXPECT_THAT(WantedOf(spec, facts), ElementsAre("the advice mapper:color=blue, mapper:size=10"));
+}
+
+TEST(FindUnmet, WantsTheAudienceAsItIsWithoutMoreOrLess) {
+  TokenSpec spec = SpecFor(3600);
+  spec.audienceRestriction = {"a", "b"};
+  TokenFacts facts = HourFrom();
+  facts.audience = {"a", "b"};
+  EXPECT_THAT(WantedOf(spec, facts), IsEmpty());
+  facts.audience = {"a"};
+  EXPECT_THAT(WantedOf(spec, facts), ElementsAre("restriction to the audience a, b; the token is for a"));
+  facts.audience = {"a", "b", "c"};
+  EXPECT_THAT(WantedOf(spec, facts), ElementsAre("restriction to the audience a, b; the token is for a, b, c"));
+}
+
+struct Life {
+  const char *name;
+  const char *start;
+  const char *end;
+  std::int64_t toleranceSec;
+  bool isMet; ///< for an hour that is asked for at 12:00:00
+};
+
+const Life LIVES[] = {
+    {"Exact", "2026-01-01T12:00:00Z", "2026-01-01T13:00:00Z", 0, true},
+    {"Longer", "2026-01-01T12:00:00Z", "2026-01-01T14:00:00Z", 0, true},
+    {"ShorterByAlmostTwoSeconds", "2026-01-01T12:00:01.500Z", "2026-01-01T12:59:58.001Z", 0, true},
+    {"ShorterByTwoSeconds", "2026-01-01T12:00:00Z", "2026-01-01T12:59:58Z", 0, false},
+    {"ShorterByTwoSecondsWhateverTheTolerance", "2026-01-01T12:00:00Z", "2026-01-01T12:59:58Z", 600, false},
+    {"ClockOfTheServiceAheadReckonsByTheRequest", "2026-01-01T12:05:00Z", "2026-01-01T13:00:00Z", 0, true},
+    {"ClockOfTheServiceAhead", "2026-01-01T12:05:00Z", "2026-01-01T13:05:00Z", 0, true},
+    {"ClockOfTheServiceBehindReckonsByTheRequest", "2026-01-01T11:50:00Z", "2026-01-01T13:00:00Z", 0, true},
+    {"ClockOfTheServiceBehindWithinTheTolerance", "2026-01-01T11:50:00Z", "2026-01-01T12:50:00Z", 600, true},
+    {"ClockOfTheServiceBehindByMoreThanTheTolerance", "2026-01-01T11:50:00Z", "2026-01-01T12:50:00Z", 598, false},
+    {"OldTokenOfTheSameSpan", "2026-01-01T11:30:00Z", "2026-01-01T12:30:00Z", 600, false},
+    {"LargeToleranceIsTenMinutes", "2026-01-01T11:30:00Z", "2026-01-01T12:30:00Z", 86400, false},
+    {"NegativeToleranceIsNone", "2026-01-01T11:59:59Z", "2026-01-01T12:59:59Z", -3600, true},
+    {"Minute", "2026-01-01T12:00:00Z", "2026-01-01T12:01:00Z", 600, false},
+};
+
+class FindUnmetLifetime : public testing::TestWithParam<Life> {};
+
+TEST_P(FindUnmetLifetime, IsMetWhenItIsNotClearlyShorter) {
+  const Life &life = GetParam();
+  const auto unmet = FindUnmet(SpecFor(3600), ASKED_AT, HourFrom(life.start, life.end), life.toleranceSec);
+  EXPECT_EQ(life.isMet, unmet.empty());
+  EXPECT_EQ(life.isMet ? 0u : 1u, unmet.size());
+}
+
+INSTANTIATE_TEST_SUITE_P(Of, FindUnmetLifetime, testing::ValuesIn(LIVES),
+                         [](const auto &life) { return std::string(life.param.name); });
+
+TEST(FindUnmet, StaysWithinItsNumbersAtTheEndOfTime) {
+  const TokenFacts facts = HourFrom("0001-01-01T00:00:00Z", "9999-12-31T23:59:59Z");
+  EXPECT_THAT(FindUnmet(SpecFor(100LL * 366 * 86400), ASKED_AT, facts, 600), IsEmpty());
+}
+
+} // namespace
+} // namespace SsoClient::Tool

@@ -1,0 +1,118 @@
+// SPDX-License-Identifier: Apache-2.0
+
+#include "unmet_request.h"
+
+#include <ssoclient/create_saml_token.h>
+
+#include <algorithm>
+
+namespace SsoClient::Tool {
+namespace {
+
+constexpr std::int64_t MICROSECONDS_PER_SECOND = 1000000;
+
+// A service may write both instants of a token in whole seconds, each of them rounded to the token's disadvantage.
+constexpr std::int64_t ROUNDING_SEC = 2;
+
+template <typename Texts>
+std::string Join(const Texts &texts) {
+  std::string joined;
+  for (const std::string &text : texts) {
+    joined += (joined.empty() ? "" : ", ") + text;
+  }
+  return joined;
+}
+
+/// Whether `name` means `delegate`. A name without a domain means that name in any domain.
+bool Means(const std::string &name, const PrincipalId &delegate) {
+  const std::size_t at = name.rfind('@');
+  if (at == std::string::npos) {
+    return PrincipalId{name, delegate.domain} == delegate;
+  }
+  return PrincipalId{name.substr(0, at), name.substr(at + 1)} == delegate;
+}
+
+void CheckDelegation(const TokenSpec &spec, const TokenFacts &facts, std::vector<UnmetRequest> &unmet) {
+  if (!spec.delegateTo) {
+    return;
+  }
+  std::string actual = "not delegated";
+  if (!facts.delegationChain.empty()) {
+    const PrincipalId &last = facts.delegationChain.back().subject;
+    if (Means(*spec.delegateTo, last)) {
+      return;
+    }
+    actual = "delegated to " + last.name + "@" + last.domain;
+  }
+  unmet.push_back({"delegation", "delegation to " + *spec.delegateTo + "; the token is " + actual});
+}
+
+bool HasAdvice(const std::vector<Advice> &all, const std::string &source, const std::string &name,
+               const std::string &value) {
+  return std::any_of(all.begin(), all.end(), [&](const Advice &advice) {
+    return advice.source == source &&
+           std::any_of(advice.attributes.begin(), advice.attributes.end(), [&](const AdviceAttribute &attribute) {
+             return attribute.name == name &&
+                    std::find(attribute.values.begin(), attribute.values.end(), value) != attribute.values.end();
+           });
+  });
+}
+
+void CheckAdvice(const TokenSpec &spec, const TokenFacts &facts, std::vector<UnmetRequest> &unmet) {
+  std::vector<std::string> missing;
+  for (const Advice &advice : spec.advice) {
+    for (const AdviceAttribute &attribute : advice.attributes) {
+      for (const std::string &value : attribute.values) {
+        if (!HasAdvice(facts.advice, advice.source, attribute.name, value)) {
+          missing.push_back(advice.source + ":" + attribute.name + "=" + value);
+        }
+      }
+    }
+  }
+  if (!missing.empty()) {
+    unmet.push_back({"advice", "the advice " + Join(missing)});
+  }
+}
+
+void CheckAudience(const TokenSpec &spec, const TokenFacts &facts, std::vector<UnmetRequest> &unmet) {
+  if (!spec.audienceRestriction.empty() && facts.audience != spec.audienceRestriction) {
+    unmet.push_back({"audience", "restriction to the audience " + Join(spec.audienceRestriction) + "; the token is " +
+                                     (facts.audience.empty() ? "not restricted" : "for " + Join(facts.audience))});
+  }
+}
+
+/// Whether the token lasts as long as was asked for. A service may reckon from its own clock or from the request's dates, so
+/// it is enough when the token ends late enough by this machine's clock, or when it lasts long enough by its own dates and
+/// the clocks explain the rest.
+bool LastsLongEnough(std::int64_t lifetimeSec, const Tarvel::System::DateTime &askedAt, const TokenFacts &facts,
+                     std::int64_t toleranceSec) {
+  const std::int64_t least = (lifetimeSec - ROUNDING_SEC) * MICROSECONDS_PER_SECOND;
+  const std::int64_t left = facts.endDate.GetUtcTime() - askedAt.GetUtcTime();
+  const std::int64_t span = facts.endDate.GetUtcTime() - facts.startDate.GetUtcTime();
+  const std::int64_t tolerance =
+      std::clamp<std::int64_t>(toleranceSec, 0, DEFAULT_CLOCK_TOLERANCE_SEC) * MICROSECONDS_PER_SECOND;
+  return left > least || (span > least && left + tolerance > least);
+}
+
+} // namespace
+
+std::vector<UnmetRequest> FindUnmet(const TokenSpec &spec, const Tarvel::System::DateTime &askedAt,
+                                    const TokenFacts &facts, std::int64_t toleranceSec) {
+  std::vector<UnmetRequest> unmet;
+  CheckDelegation(spec, facts, unmet);
+  if (spec.renewable && !facts.renewable) {
+    unmet.push_back({"renewable", "a renewable token"});
+  }
+  if (spec.delegable && !facts.delegable) {
+    unmet.push_back({"delegable", "a delegable token"});
+  }
+  CheckAdvice(spec, facts, unmet);
+  CheckAudience(spec, facts, unmet);
+  if (!LastsLongEnough(spec.tokenLifetimeSec, askedAt, facts, toleranceSec)) {
+    unmet.push_back({"lifetime", "a lifetime of " + std::to_string(spec.tokenLifetimeSec) +
+                                     " seconds; the token ends at " + facts.endDate.ToString()});
+  }
+  return unmet;
+}
+
+} // namespace SsoClient::Tool
