@@ -34,7 +34,6 @@ constexpr Meaning MEANINGS[] = {
     {ExitCode::SIGNATURE_INVALID, "signature invalid"},
     {ExitCode::FILE_OR_KEY, "a file, key, certificate or passphrase"},
     {ExitCode::SERVICE_FAULT, "any other failure that the service reports"},
-    {ExitCode::OUTPUT_LOST, "the token is in its file, but standard output failed"},
     {ExitCode::INTERRUPTED, "interrupted"},
 };
 
@@ -51,7 +50,6 @@ struct Row {
 // The first row that matches counts, so a class stands above its base.
 constexpr Row TABLE[] = {
     {IsA<UsageException>, {ExitCode::USAGE, "UsageException", "usage"}},
-    {IsA<OutputException>, {ExitCode::OUTPUT_LOST, "OutputException", "output"}},
 #ifdef SSOCLIENT_TOOL_HAS_GSSAPI
     {IsA<Gssapi::GssCredentialException>, {ExitCode::CREDENTIALS_REFUSED, "GssCredentialException", "credentials"}},
     {IsA<Gssapi::GssLimitException>, {ExitCode::COMMUNICATION, "GssLimitException", "communication failed"}},

@@ -21,7 +21,6 @@ enum class ExitCode : int {
   SIGNATURE_INVALID = 6,
   FILE_OR_KEY = 7,
   SERVICE_FAULT = 8,
-  OUTPUT_LOST = 9,
   INTERRUPTED = 130,
 };
 
@@ -30,12 +29,6 @@ std::string ExitCodeHelp();
 
 /// A command line that the tool cannot act on.
 class UsageException : public std::runtime_error {
-public:
-  using std::runtime_error::runtime_error;
-};
-
-/// Standard output that could not be written, after a token was put into its file.
-class OutputException : public std::runtime_error {
 public:
   using std::runtime_error::runtime_error;
 };

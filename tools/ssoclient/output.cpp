@@ -113,12 +113,15 @@ void WriteOutput(std::string_view text) {
   }
 }
 
-void Warn(std::string_view message, const OutputOptions &output) {
-  if (output.format == Format::JSON && !output.verbose) {
-    return;
-  }
+void Warn(std::string_view message) {
   const std::string line = "ssoclient: warning: " + PrintableLine(message) + "\n";
   std::fputs(line.c_str(), stderr);
+}
+
+void Warn(std::string_view message, const OutputOptions &output) {
+  if (output.format != Format::JSON || output.verbose) {
+    Warn(message);
+  }
 }
 
 void ShowLibraryLog() {

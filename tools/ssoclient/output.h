@@ -34,8 +34,11 @@ std::string ReadInput(const std::string &path, std::size_t limit);
 /// @throws Tarvel::IOException when it cannot be written in full.
 void WriteOutput(std::string_view text);
 
-/// One line on standard error. In JSON there is none unless the caller wants to see more: a program expects the failure's
-/// object there, and nothing else.
+/// One line on standard error, for what comes after the command's success.
+void Warn(std::string_view message);
+
+/// The same for what a failure may follow. In JSON there is none unless the caller wants to see more: a program expects
+/// the failure's object there, and nothing else.
 void Warn(std::string_view message, const OutputOptions &output);
 
 /// From now on each line that the library logs goes to standard error, as a line of its own.

@@ -16,12 +16,13 @@ namespace {
 constexpr const char *GROUP = "Output";
 constexpr const char *STANDARD_OUTPUT = "-";
 
-/// Shows on standard output what the token in `file` says.
+/// Shows on standard output what the token in `file` says. If that fails, the command has still done what it was asked to
+/// do: the token is in its file.
 void ShowBeside(const std::string &file, const std::string &text) {
   try {
     WriteOutput(text);
   } catch (const Tarvel::IOException &failure) {
-    throw OutputException(file + " is written, but not what it says: " + failure.what());
+    Warn(file + " is written, but not what it says: " + failure.what());
   }
 }
 
@@ -50,7 +51,7 @@ void WriteToken(const IssuedToken &issued, const TokenSpec &spec, std::int64_t t
   TokenReport report = ReportOf(*issued.token);
   report.unmet = FindUnmet(spec, issued.askedAt, report.facts, toleranceSec);
   for (const UnmetRequest &request : *report.unmet) {
-    Warn("asked for, but not given by the service: " + request.wanted, output);
+    Warn("asked for, but not given by the service: " + request.wanted);
   }
 
   if (options.file == STANDARD_OUTPUT) {

@@ -33,7 +33,6 @@ void CheckTokenOutput(const TokenOutputOptions &options, const OutputOptions &ou
 /// standard output what the token says, unless that would be, or is already, the XML itself.
 /// @param toleranceSec as for `FindUnmet`
 /// @throws Tarvel::IOException when the XML cannot be written.
-/// @throws OutputException when the XML is in its file, and standard output cannot be written.
 void WriteToken(const IssuedToken &issued, const TokenSpec &spec, std::int64_t toleranceSec,
                 const TokenOutputOptions &options, const OutputOptions &output);
 

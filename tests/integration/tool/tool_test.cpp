@@ -461,7 +461,6 @@ TEST(Tool, ListsItsCommandsAndExitCodesInTheHelp) {
   6    signature invalid
   7    a file, key, certificate or passphrase
   8    any other failure that the service reports
-  9    the token is in its file, but standard output failed
   130  interrupted
 )"));
 }
