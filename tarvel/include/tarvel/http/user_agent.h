@@ -87,7 +87,8 @@ public:
   /// `InvalidStateException` with its text. The exception is valid during the call. The item is the one that
   /// `StartRequest` hands out. An exception that leaves the function is logged and goes no further. The function must not
   /// block, nor wait for another request: the thread is one of two, on which that request would have to complete. Start
-  /// the next one from here, and queue work that takes time on a thread pool.
+  /// the next one from here, and queue work that takes time on a thread pool. It is never called in a child that `fork` has
+  /// made since the start.
   using CompletionFunction =
       std::function<void(const Exception *, const Ref<ClientResponse> &, const Ref<PendingRequestItem> &)>;
 
@@ -105,8 +106,9 @@ public:
   /// Waits until the request is done and its completion function has run. Not for use in a completion function, which
   /// would wait for itself.
   /// @param timeoutMicroseconds counted from this call; when it has passed, the request is cancelled.
-  /// @throws System::TimeoutException after the time-out; otherwise what the request failed with, as its own class;
-  ///         InvalidArgumentException for an item that is no request.
+  /// @throws System::TimeoutException after the time-out; System::NetworkException, at once, in a child that `fork` made
+  ///         while the request was under way; otherwise what the request failed with, as its own class;
+  ///         InvalidArgumentException for an item that is not a request.
   virtual void WaitForRequest(const Ref<PendingRequestItem> &pending, std::int64_t timeoutMicroseconds,
                               Ref<ClientResponse> &response) = 0;
 

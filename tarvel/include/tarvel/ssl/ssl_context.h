@@ -47,7 +47,7 @@ protected:
 /// Settings and session memory for TLS connections: TLS 1.2 or later, cipher suites with forward secrecy alone, keys of at least
 /// 112 bits of security, peer and host name always verified. No configuration of OpenSSL changes that, and
 /// `Crypto::UseSystemConfiguration` can only narrow it. Set it up on one thread, then use it on any; not to be changed while
-/// in use.
+/// in use. A child process made by `fork` may use the contexts of its parent; it has no session of the parent's.
 ///
 /// Each function also throws `InvalidStateException` when OpenSSL has cleaned itself up, and `OutOfMemoryException`.
 class TARVEL_API SSLContext : public Object {

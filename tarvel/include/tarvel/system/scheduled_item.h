@@ -18,7 +18,7 @@ public:
   /// what is done stays done. May be called any number of times. Does not wait.
   virtual void Cancel() noexcept = 0;
 
-  /// Whether the work has ended, by whatever way.
+  /// Whether the work has ended, by whatever way; in a child process, whether it ended there or is the parent's.
   virtual bool IsDone() const noexcept = 0;
 
 protected:

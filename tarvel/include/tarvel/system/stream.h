@@ -37,13 +37,17 @@ class TARVEL_API TimeoutException : public NetworkException {
 ///
 /// At most one read and one write may be pending at a time. Buffers belong to the caller and must stay until the
 /// completion. Any thread may start and close.
+///
+/// A child process made by `fork` closes its copy of the connection and sends nothing over it. No completion of an operation
+/// that the parent has begun is called there; what the child begins on such a stream fails.
 class TARVEL_API Stream : public Object {
 public:
   /// Called with the number of bytes moved and null, or with what went wrong, which is valid during the call: a
-  /// `NetworkException` (also when memory runs out on the way), over TLS its `Ssl::SSLException`; `InvalidArgumentException` or `InvalidStateException` for a
-  /// read of no bytes and, over TLS, for a second read or write while one is pending and for one before the handshake. Over TLS
-  /// also an `InvalidStateException` when OpenSSL has cleaned itself up because the process ends, at once whatever the peer does,
-  /// and an `OutOfMemoryException`; either ends the connection.
+  /// `NetworkException` (also when memory runs out on the way), over TLS its `Ssl::SSLException`;
+  /// `InvalidArgumentException` or `InvalidStateException` for a read of no bytes and, over TLS, for a second read or write
+  /// while one is pending, for one before the handshake, and for one on a connection that is the parent process's. Over TLS
+  /// also an `InvalidStateException` when OpenSSL has cleaned itself up because the process ends, at once whatever the peer
+  /// does, and an `OutOfMemoryException`; either ends the connection.
   using TransferHandler = std::function<void(std::size_t, const Exception *)>;
 
   /// Reads at least one byte, at most `length`; 0 bytes and no exception mean the peer's orderly end.

@@ -18,6 +18,9 @@ namespace System {
 /// Runs queued functions on threads of its own. Threads are made on demand up to a ceiling and end when they have been
 /// idle for a while. The queue is bounded by memory alone. Network completions never run here, so work that waits for
 /// the network cannot starve itself, whatever the ceiling. Safe on any thread.
+///
+/// A child process made by `fork` may use the pools of its parent: they have threads of its own there. What the parent has
+/// queued never runs in the child, and counts as done.
 class TARVEL_API ThreadPool : public Object {
 public:
   /// Queues `work` for one run and returns at once. Items start in the order in which they are queued. An exception
