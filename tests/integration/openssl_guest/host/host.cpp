@@ -2,6 +2,7 @@
 // A program that has the library in it, and does what its arguments say, one after the other.
 #include "support/completion.h"
 #include "support/data_file.h"
+#include "support/outliving_thread.h"
 
 #include <ssoclient/create_saml_token.h>
 #include <ssoclient/exceptions.h>
@@ -126,7 +127,12 @@ public:
     }
   }
 
-  void Start(std::function<void()> work) { m_worker = std::thread(std::move(work)); }
+  void Start(std::function<void()> work) {
+    m_worker = std::thread([work = std::move(work)] {
+      Testing::BeginOutlivingThread();
+      work();
+    });
+  }
 
   std::vector<std::function<void()>> atEnd;
 

@@ -1,5 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 // A host that ends while a worker's request over TLS is under way; a static object waits for the worker.
+#include "support/outliving_thread.h"
+
 #include <ssoclient/exceptions.h>
 #include <ssoclient/security_token_service.h>
 #include <tarvel/ssl/ssl_context.h>
@@ -49,6 +51,7 @@ std::string Acquire(const char *url) {
 
 int main() {
   g_worker.thread = std::thread([] {
+    Testing::BeginOutlivingThread();
     const std::string outcome = Acquire("HTTPS");
     std::printf("worker: %s\n", outcome.c_str());
   });
