@@ -2,6 +2,8 @@
 
 #include <tarvel/core/string_util.h>
 
+#include "system/fork_gate.h"
+
 #include <algorithm>
 #include <clocale>
 #include <cwctype>
@@ -19,6 +21,7 @@ constexpr wint_t LAST_CODE_POINT = 0x10FFFF;
 /// The Unicode locale that the C library carries, whatever locale the host process has chosen. Null when this system
 /// does not have it. It is kept until the process ends.
 locale_t UnicodeLocale() {
+  const System::Computation computing; // the C library has a lock of its own
   static std::once_flag once;
   static locale_t locale = nullptr;
   std::call_once(once, [] { locale = ::newlocale(LC_CTYPE_MASK, "C.UTF-8", nullptr); });

@@ -6,8 +6,6 @@
 
 #include <mutex>
 
-#include <unistd.h>
-
 namespace Tarvel::Crypto {
 
 namespace {
@@ -18,8 +16,7 @@ OpenSslEndNotice *first = nullptr; // the newest
 
 } // namespace
 
-OpenSslEndNotice::OpenSslEndNotice(Function function, void *owner) noexcept
-    : m_function(function), m_owner(owner), m_process(getpid()) {
+OpenSslEndNotice::OpenSslEndNotice(Function function, void *owner) noexcept : m_function(function), m_owner(owner) {
   const std::lock_guard<System::ForkSafeMutex> lock(mutex);
   m_next = first;
   if (m_next) {
@@ -50,7 +47,7 @@ void OpenSslEndNotice::CallAll() noexcept {
       first->m_previous = nullptr;
     }
     notice->m_next = nullptr;
-    if (notice->m_process == getpid()) {
+    if (notice->m_generation == System::GetForkGeneration()) {
       notice->m_function(notice->m_owner);
     }
   }

@@ -101,6 +101,8 @@ void OpenSslUse::Abandon(void *object) noexcept {
 }
 
 void OpenSslUse::Prepare() {
+  // Around the once, or a thread within it could wait for a fork that waits for a thread that waits for the once.
+  const System::Computation computing;
   static std::once_flag registered;
   std::call_once(registered, [] {
     // In this order, for it is OpenSSL's own initialisation that arranges for the clean-up.

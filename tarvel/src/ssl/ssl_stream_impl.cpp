@@ -59,6 +59,18 @@ void CallGuarded(const Handler &handler, const Args &...args) noexcept {
 
 constexpr const char *OF_PARENT = "The connection belongs to the process that this one was forked from";
 
+/// What went wrong below; none when nothing did.
+std::optional<std::string> DescribeLowerFailure(const Exception *exception) noexcept {
+  if (!exception) {
+    return std::nullopt;
+  }
+  try {
+    return exception->what();
+  } catch (...) {
+    return "no memory"; // which is short enough to need none
+  }
+}
+
 /// Calls `handler` with `arguments` and an `InvalidStateException` for `reason`, on an I/O thread.
 template <typename Handler, typename... Arguments>
 void PostRefusal(Handler handler, const char *reason, Arguments... arguments) {
@@ -85,14 +97,14 @@ public:
     m_write = {std::move(handler), count, std::move(failure)};
   }
 
-  bool IsEmpty() const noexcept { return !m_handshake && !m_read.handler && !m_write.handler; }
-
   void Run() const noexcept {
+    const unsigned generation = System::GetForkGeneration();
     if (m_handshake) {
       CallGuarded(m_handshake, m_handshakeFailure.get());
     }
     for (const Transfer *transfer : {&m_write, &m_read}) {
-      if (transfer->handler) {
+      // A handler may have forked: in the child none of the others is called.
+      if (transfer->handler && generation == System::GetForkGeneration()) {
         CallGuarded(transfer->handler, transfer->count, transfer->failure.get());
       }
     }
@@ -147,11 +159,13 @@ void SSLStreamImpl::AsyncHandshake(const std::string &host, const std::string &p
     });
     return;
   }
+  std::string ownHost = host;
+  std::string ownParameter = parameter;
+  PostPump(); // the last that may fail; what it posts waits for the lock
   m_stage = Stage::SHAKING;
-  m_host = host;
-  m_parameter = parameter;
+  m_host = std::move(ownHost);
+  m_parameter = std::move(ownParameter);
   m_handshake = std::move(handler);
-  PostPump();
 }
 
 void SSLStreamImpl::AsyncReadSome(char *buffer, std::size_t length, TransferHandler handler) {
@@ -164,8 +178,8 @@ void SSLStreamImpl::AsyncReadSome(char *buffer, std::size_t length, TransferHand
     PostRefusal(std::move(handler), "Another read is pending, or the read is one of no bytes", std::size_t{0});
     return;
   }
-  m_read = PendingRead{buffer, length, std::move(handler)};
   PostPump();
+  m_read = PendingRead{buffer, length, std::move(handler)};
 }
 
 void SSLStreamImpl::AsyncWrite(const char *bytes, std::size_t length, TransferHandler handler) {
@@ -178,8 +192,8 @@ void SSLStreamImpl::AsyncWrite(const char *bytes, std::size_t length, TransferHa
     PostRefusal(std::move(handler), "Another write is pending", std::size_t{0});
     return;
   }
-  m_write = PendingWrite{bytes, length, 0, std::move(handler)};
   PostPump();
+  m_write = PendingWrite{bytes, length, 0, std::move(handler)};
 }
 
 void SSLStreamImpl::Close() noexcept {
@@ -187,31 +201,48 @@ void SSLStreamImpl::Close() noexcept {
     m_lower->Close();
     return;
   }
-  try {
-    const System::Computation computing;
-    auto done = std::make_shared<Completions>();
-    if (const Crypto::OpenSslUse use; !use) {
-      const std::lock_guard<System::ForkSafeMutex> lock(m_mutex);
-      FailAfterOpenSsl(*done);
+  {
+    const Crypto::OpenSslUse use;
+    const std::lock_guard<System::ForkSafeMutex> lock(m_mutex);
+    if (!use) {
+      MarkEnded();
     } else {
-      const std::lock_guard<System::ForkSafeMutex> lock(m_mutex);
-      const Crypto::OpenSslErrorScope errors;
-      if (m_stage == Stage::ESTABLISHED && !m_lowerWrites) {
-        SSL_shutdown(m_connection.get()); // the notice leaves only if the stream below takes it at once
-        StartLowerWrite();
-      }
+      SendClosingNotice();
       if (m_stage != Stage::FAILED) {
-        Fail("closed by this side", *done);
+        MarkFailed(MakeFailureOrNoMemory("closed by this side"));
       }
       EndConnection();
     }
-    if (!done->IsEmpty()) {
-      boost::asio::post(System::GetIoContext(), [done] { done->Run(); });
-    }
-  } catch (...) {
-    LogUncaughtException("the end of a TLS connection");
+    CompletePendingSoon();
   }
   m_lower->Close();
+}
+
+/// The notice leaves only if the stream below takes it at once.
+void SSLStreamImpl::SendClosingNotice() noexcept {
+  if (m_stage != Stage::ESTABLISHED || m_lowerWrites) {
+    return;
+  }
+  try {
+    const Crypto::OpenSslErrorScope errors;
+    SSL_shutdown(m_connection.get());
+    StartLowerWrite();
+  } catch (...) {
+    // Without memory the connection ends without it.
+  }
+}
+
+/// What is pending, when the stream has failed. Without memory for it, the end of the operation below does it: as long as
+/// something is pending, either this has been posted or there is such an operation.
+void SSLStreamImpl::CompletePendingSoon() noexcept {
+  if (!m_handshake && !m_read && !m_write) {
+    return;
+  }
+  try {
+    PostPump();
+  } catch (...) {
+    // As said.
+  }
 }
 
 // Always on an I/O thread: OpenSSL reports through the thread's error queue, and there it holds nothing of the host's.
@@ -221,13 +252,14 @@ void SSLStreamImpl::PostPump() {
 }
 
 template <typename Step>
-void SSLStreamImpl::Advance(const Step &step) {
+void SSLStreamImpl::Advance(const Step &step) noexcept {
   Completions done;
   {
     const Crypto::OpenSslUse use;
     const std::lock_guard<System::ForkSafeMutex> lock(m_mutex);
     if (!use) {
-      FailAfterOpenSsl(done);
+      MarkEnded();
+      FailPending(m_failure, done);
     } else {
       try {
         step(done);
@@ -235,28 +267,35 @@ void SSLStreamImpl::Advance(const Step &step) {
         FailWith(m_noMemory, done);
       } catch (const std::bad_alloc &) {
         FailWith(m_noMemory, done);
-      } catch (const Exception &exception) {
+      } catch (const std::exception &exception) {
         Fail(exception.what(), done);
+      } catch (...) {
+        Fail("an object that is not an exception was thrown", done); // by a stream below that is not the platform's
       }
     }
   }
   done.Run();
 }
 
-void SSLStreamImpl::OnOpenSslEnd(void *stream) noexcept {
+template <typename Step>
+void SSLStreamImpl::AdvanceOnIoThread(Step step) noexcept {
   try {
-    auto &self = *static_cast<SSLStreamImpl *>(stream);
-    auto done = std::make_shared<Completions>();
-    {
-      const std::lock_guard<System::ForkSafeMutex> lock(self.m_mutex);
-      self.FailAfterOpenSsl(*done);
-    }
-    if (!done->IsEmpty()) {
-      boost::asio::post(System::GetIoContext(), [done] { done->Run(); });
-    }
+    const System::Computation computing;
+    boost::asio::dispatch(System::GetIoContext(), [self = Ref(this), step = std::move(step)] { self->Advance(step); });
   } catch (...) {
-    LogUncaughtException("the end of a TLS connection");
+    Advance([](Completions &) { throw OutOfMemoryException(); }); // here, for there is no memory to go elsewhere
   }
+}
+
+// Perhaps while another thread drops the last reference, so there is none to be taken here. As long as something is pending,
+// an operation below has one, or a step that has been posted.
+void SSLStreamImpl::OnOpenSslEnd(void *stream) noexcept {
+  auto &self = *static_cast<SSLStreamImpl *>(stream);
+  {
+    const std::lock_guard<System::ForkSafeMutex> lock(self.m_mutex);
+    self.MarkEnded();
+  }
+  self.m_lower->Close();
 }
 
 void SSLStreamImpl::Pump(Completions &done) {
@@ -415,7 +454,7 @@ int SSLStreamImpl::OnNewSession(SSL *connection, SSL_SESSION *session) noexcept 
   try {
     stream->KeepSession(SessionHandle(session));
   } catch (...) {
-    LogUncaughtException("the keeping of a TLS session"); // freed by its handle
+    // Without memory for it, it is not kept: freed by its handle. Nobody is called while the lock is held, nor a log sink.
   }
   return 1;
 }
@@ -437,7 +476,7 @@ void SSLStreamImpl::EndConnection() noexcept {
       m_context->GetSessions().Put(m_sessionKey, std::move(session));
     }
   } catch (...) {
-    LogUncaughtException("the keeping of a TLS session"); // freed by its handle
+    // As above.
   }
 }
 
@@ -505,20 +544,18 @@ void SSLStreamImpl::StartLowerRead() {
   if (m_lowerReads || m_stage == Stage::FAILED) {
     return;
   }
-  m_lowerReads = true;
-  m_lower->AsyncReadSome(
-      m_lowerInput.data(), m_lowerInput.size(), [self = Ref(this)](std::size_t count, const Exception *exception) {
-        auto proceed = [self, count, failure = exception ? LowerFailure(exception->what()) : LowerFailure()] {
-          self->Advance([&](Completions &done) { self->OnLowerRead(count, failure, done); });
-        };
-        const System::Computation computing;
-        boost::asio::dispatch(System::GetIoContext(), std::move(proceed));
-      });
+  m_lower->AsyncReadSome(m_lowerInput.data(), m_lowerInput.size(),
+                         [self = Ref(this)](std::size_t count, const Exception *exception) {
+                           self->AdvanceOnIoThread([self, count, failure = DescribeLowerFailure(exception)](
+                                                       Completions &done) { self->OnLowerRead(count, failure, done); });
+                         });
+  m_lowerReads = true; // its end waits for the lock
 }
 
 void SSLStreamImpl::OnLowerRead(std::size_t count, const LowerFailure &failure, Completions &done) {
   m_lowerReads = false;
   if (m_stage == Stage::FAILED) {
+    FailPending(m_failure, done);
     return;
   }
   if (failure) {
@@ -546,21 +583,20 @@ void SSLStreamImpl::StartLowerWrite() {
   }
   m_lowerOutput.resize(pending);
   const int count = BIO_read(m_toSend, m_lowerOutput.data(), static_cast<int>(pending));
-  m_lowerWrites = true;
   m_lower->AsyncWrite(m_lowerOutput.data(), static_cast<std::size_t>(count),
                       [self = Ref(this)](std::size_t, const Exception *exception) {
-                        auto proceed = [self, failure = exception ? LowerFailure(exception->what()) : LowerFailure()] {
-                          self->Advance([&](Completions &done) { self->OnLowerWritten(failure, done); });
-                        };
-                        const System::Computation computing;
-                        boost::asio::dispatch(System::GetIoContext(), std::move(proceed));
+                        self->AdvanceOnIoThread([self, failure = DescribeLowerFailure(exception)](Completions &done) {
+                          self->OnLowerWritten(failure, done);
+                        });
                       });
+  m_lowerWrites = true;
 }
 
 // A failure ends writing alone: a server that refuses a request may have sent an answer, or an alert, and said why.
 void SSLStreamImpl::OnLowerWritten(const LowerFailure &failure, Completions &done) {
   m_lowerWrites = false;
   if (m_stage == Stage::FAILED) {
+    FailPending(m_failure, done);
     return;
   }
   m_lowerWriteFailure = failure;
@@ -574,29 +610,40 @@ SSLStreamImpl::Failure SSLStreamImpl::MakeFailure(const std::string &reason) con
                                         (reason.empty() ? "OpenSSL gives no reason" : reason));
 }
 
-void SSLStreamImpl::Fail(const std::string &reason, Completions &done) {
-  FailWith(MakeFailure(reason), done);
+SSLStreamImpl::Failure SSLStreamImpl::MakeFailureOrNoMemory(const char *reason) const noexcept {
+  try {
+    return MakeFailure(reason);
+  } catch (...) {
+    return m_noMemory;
+  }
 }
 
-void SSLStreamImpl::FailWith(Failure failure, Completions &done) {
+void SSLStreamImpl::Fail(const std::string &reason, Completions &done) noexcept {
+  FailWith(MakeFailureOrNoMemory(reason.c_str()), done);
+}
+
+void SSLStreamImpl::FailWith(Failure failure, Completions &done) noexcept {
+  MarkFailed(std::move(failure));
+  FailPending(m_failure, done);
+}
+
+void SSLStreamImpl::MarkFailed(Failure failure) noexcept {
   if (m_stage == Stage::ESTABLISHED) {
     // Else OpenSSL takes the session for no longer resumable; what spoils a session, OpenSSL has noted by itself.
     SSL_set_shutdown(m_connection.get(), SSL_SENT_SHUTDOWN | SSL_RECEIVED_SHUTDOWN);
   }
   m_failure = std::move(failure);
   m_stage = Stage::FAILED;
-  FailPending(m_failure, done);
 }
 
-void SSLStreamImpl::FailAfterOpenSsl(Completions &done) {
+void SSLStreamImpl::MarkEnded() noexcept {
   if (m_stage != Stage::FAILED) {
-    m_failure = std::make_shared<InvalidStateException>(Crypto::OpenSslUse::ENDED);
+    m_failure = m_processEnds;
     m_stage = Stage::FAILED;
   }
-  FailPending(m_failure, done);
 }
 
-void SSLStreamImpl::FailPending(const Failure &failure, Completions &done) {
+void SSLStreamImpl::FailPending(const Failure &failure, Completions &done) noexcept {
   if (m_handshake) {
     done.AddHandshake(std::exchange(m_handshake, nullptr), failure);
   }

@@ -73,9 +73,13 @@ private:
   bool IsOfParent() const noexcept { return m_generation != System::GetForkGeneration(); }
 
   void PostPump();
-  /// Takes `step` under the lock, or fails what is pending once OpenSSL is gone; then calls the handlers.
+  /// Takes `step` under the lock, or fails what is pending once OpenSSL is gone; then calls the handlers. What `step` throws
+  /// ends the stream.
   template <typename Step>
-  void Advance(const Step &step);
+  void Advance(const Step &step) noexcept;
+  /// The same on an I/O thread, on which a stream below that is not the platform's need not call back.
+  template <typename Step>
+  void AdvanceOnIoThread(Step step) noexcept;
   /// For the end of OpenSSL. Nobody would wake a read that waits for a server that is silent.
   static void OnOpenSslEnd(void *stream) noexcept;
 
@@ -94,23 +98,30 @@ private:
   std::string RefuseServer() const;
   std::string VerifyServer(X509_STORE_CTX *verification) const;
   void KeepSession(SessionHandle session);
+  void SendClosingNotice() noexcept;
+  void CompletePendingSoon() noexcept;
   /// Frees the connection and has its sessions remembered. The stream has failed, or nobody holds it any more.
   void EndConnection() noexcept;
 
   /// Whether OpenSSL, whose call gave `result`, waits for bytes. If not, the stream has failed.
   bool WaitsForBytes(int result, const Crypto::OpenSslErrorScope &errors, Completions &done);
   /// Each of these ends the stream for good: what is pending, and what comes, fails.
-  void Fail(const std::string &reason, Completions &done);
-  void FailWith(Failure failure, Completions &done);
-  void FailAfterOpenSsl(Completions &done);
+  void Fail(const std::string &reason, Completions &done) noexcept;
+  void FailWith(Failure failure, Completions &done) noexcept;
+  /// The same, but what is pending is left to a later step.
+  void MarkFailed(Failure failure) noexcept;
+  /// The same once OpenSSL is gone.
+  void MarkEnded() noexcept;
   Failure MakeFailure(const std::string &reason) const;
-  void FailPending(const Failure &failure, Completions &done);
+  Failure MakeFailureOrNoMemory(const char *reason) const noexcept;
+  void FailPending(const Failure &failure, Completions &done) noexcept;
 
   const unsigned m_generation = System::GetForkGeneration();
   const Ref<SSLContextImpl> m_context;
   const Ref<System::Stream> m_lower;
   const std::string m_endpoint;
   const Failure m_noMemory = std::make_shared<OutOfMemoryException>();
+  const Failure m_processEnds = std::make_shared<InvalidStateException>(Crypto::OpenSslUse::ENDED);
   std::atomic<bool> m_wasResumed{false};
 
   System::ForkSafeMutex m_mutex; // guards all that follows; never held while a handler runs

@@ -4,6 +4,7 @@
 
 #include "system/current_environment.h"
 #include "system/date_time_text.h"
+#include "system/fork_gate.h"
 
 #include <algorithm>
 #include <chrono>
@@ -64,6 +65,7 @@ int UnitsInto(const DateTime &value) {
 std::int32_t LocalBiasMinutes(std::int64_t utcMicroseconds) {
   const std::time_t seconds = floor<std::chrono::seconds>(microseconds(utcMicroseconds)).count();
   std::tm local{};
+  const Computation computing; // the C library has a lock of its own
   if (!::localtime_r(&seconds, &local)) {
     return 0;
   }

@@ -17,6 +17,8 @@ namespace Tarvel::System {
 namespace {
 
 constexpr std::chrono::microseconds WAIT_STEP{50};
+/// How often a thread steps that forks within a computation of its own. Others may wait for what it holds, and then never end.
+constexpr int MAX_STEPS_WITHIN = 2000;
 
 /// The threads that compute, counted by lanes: one count for all would be what they queue up for.
 struct alignas(LANE_ALIGNMENT) Lane {
@@ -30,7 +32,8 @@ std::array<Lane, LANES> lanes;
 std::atomic<int> forking{0};
 std::atomic<unsigned> generation{0};
 std::atomic<ForkListener *> listener{nullptr};
-std::mutex forks; // held during a fork: there is one at a time
+std::mutex forks;     // held during a fork: there is one at a time
+bool isQuiet = false; // during a fork: nobody else computes
 std::atomic<bool> registers{false};
 
 thread_local unsigned depth = 0;           // of the computations that the thread has begun
@@ -64,26 +67,40 @@ std::uint32_t CountComputing() noexcept {
   return threads;
 }
 
-/// 1 when the calling thread computes, and so forks within a computation of its own, from a signal handler perhaps.
+/// 1 when the calling thread computes, and so forks within a computation of its own: in a signal handler, or in a module that
+/// OpenSSL has loaded. Such a child executes a program.
 std::uint32_t CountOwn() noexcept {
   return depth > 0 ? 1 : 0;
 }
 
-void BeforeFork() noexcept {
+/// One fork at a time. A thread that waits for its turn does not count, or it would be waited for.
+void LockForks() noexcept {
+  if (depth > 0) {
+    EndComputing();
+  }
   forks.lock();
+  if (depth > 0) {
+    OwnLane().fetch_add(1);
+  }
+}
+
+void BeforeFork() noexcept {
+  LockForks();
   isForkingThread = true;
   forking.store(1);
   ForkListener *listening = nullptr;
-  do {
+  isQuiet = false;
+  for (int step = 0; !isQuiet && (depth == 0 || step < MAX_STEPS_WITHIN); ++step) {
     // A thread that still computes may set the first listener.
     if (!listening && (listening = listener.load())) {
       listening->BeforeFork();
     }
-    if (CountComputing() > CountOwn()) {
+    isQuiet = CountComputing() <= CountOwn();
+    if (!isQuiet) {
       std::this_thread::sleep_for(WAIT_STEP);
     }
-  } while (CountComputing() > CountOwn());
-  if (listening) {
+  }
+  if (listening && isQuiet) {
     listening->AtFork();
   }
 }
@@ -109,7 +126,8 @@ void AfterForkInChild() noexcept {
     lane.threads.store(0);
   }
   OwnLane().store(CountOwn());
-  if (ForkListener *const listening = listener.exchange(nullptr)) {
+  ForkListener *const listening = listener.exchange(nullptr);
+  if (listening && isQuiet) {
     listening->AfterForkInChild();
   }
   EndFork();

@@ -52,8 +52,8 @@ public:
       for (int started = 1; started < IO_THREADS; ++started) {
         StartBackgroundThread("tarvel-io", [this] { Run(); }).detach();
       }
-    } catch (const InvalidStateException &) {
-      // One thread does the same work, only later.
+    } catch (...) {
+      // One thread does the same work, only later; and it runs already.
     }
   }
 
@@ -152,11 +152,11 @@ void ClosesInChild::Enter() {
 }
 
 void ClosesInChild::Leave() noexcept {
+  Descriptors &descriptors = GetDescriptors();
+  const std::lock_guard<ForkSafeMutex> lock(descriptors.mutex);
   if (!is_linked()) {
     return; // closed in this child
   }
-  Descriptors &descriptors = GetDescriptors();
-  const std::lock_guard<ForkSafeMutex> lock(descriptors.mutex);
   descriptors.open.erase(descriptors.open.iterator_to(*this));
 }
 

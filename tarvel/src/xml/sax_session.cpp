@@ -195,9 +195,9 @@ SaxSession::SaxSession(std::string_view source, XMLHandler &handler)
     : m_source(source), m_handler(handler), m_lineBegin(GetByteOrderMarkLength(source)), m_lineCounted(m_lineBegin) {}
 
 void SaxSession::Run() {
+  const System::Computation computing; // libxml2 has locks of its own
   static std::once_flag initialised;
   std::call_once(initialised, [] { xmlInitParser(); });
-  const System::Computation computing; // libxml2 has locks of its own
   errno = 0;
   const LastErrorKeeper lastError;
   const Context context(*this);

@@ -70,6 +70,7 @@ struct AttributeEvent {
   std::string_view value;
 };
 
+/// Its functions run within the parse, for whose end `fork` waits: they must not wait for a thread that forks.
 class TARVEL_API XMLHandler : public Object {
 public:
   /// A document begins. `source` is its text; it stays where it is, and alive, as long as somebody holds `owner`, so that
