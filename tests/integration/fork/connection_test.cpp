@@ -315,6 +315,36 @@ TEST_P(TlsAfterFork, AContextOfTheParentServesTheChildWithoutAnySessionOfThePare
   EXPECT_EQ(countSessions(), left);
 }
 
+// Both operations end in one step, of which the first handler makes a child that goes on with it.
+TEST_P(TlsAfterFork, AHandlerThatForksIsTheLastToBeCalledInTheChild) {
+  const ServerProcess silent(
+      [](ServerConnection &connection) {
+        connection.ShakeHands();
+        connection.WaitForInterrupt();
+      },
+      Settings());
+  TlsClient client(CreateTrustingContext(), silent.GetPort());
+  ASSERT_EQ(client.ShakeHands(), "");
+  const Shared<std::atomic<int>> calls;
+  pid_t child = -1;
+  const auto note = [&](std::size_t, const Exception *) {
+    ++*calls;
+    if (child < 0) {
+      child = ::fork(); // the child's copy of the I/O thread ends with the step, and the child with it
+    }
+  };
+  char byte = 0;
+  const std::string much(16 * 1024 * 1024, 'x'); // more than the connection takes
+  client.GetStream()->AsyncReadSome(&byte, 1, note);
+  client.GetStream()->AsyncWrite(much.data(), much.size(), note);
+  client.GetStream()->Close();
+  ASSERT_TRUE(Testing::Eventually([&] { return *calls >= 2; }));
+  ASSERT_TRUE(Testing::DrainIoThreads());
+  ASSERT_GT(child, 0);
+  EXPECT_EQ(Testing::WaitForChild(child), "");
+  EXPECT_EQ(*calls, 2);
+}
+
 INSTANTIATE_TEST_SUITE_P(Versions, TlsAfterFork, testing::Values(0x0303, 0x0304));
 
 // Handshakes, which compute, in the parent while it forks.

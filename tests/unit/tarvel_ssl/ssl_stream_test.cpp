@@ -16,7 +16,10 @@
 
 #include <atomic>
 #include <cstdlib>
+#include <functional>
 #include <future>
+#include <new>
+#include <stdexcept>
 #include <string>
 #include <vector>
 
@@ -270,6 +273,40 @@ public:
 private:
   Ref<SSLContext> m_context;
 };
+
+/// A stream of a host's own: each start throws what the test says.
+class ThrowingStream final : public System::Stream {
+public:
+  explicit ThrowingStream(std::function<void()> start) : m_start(std::move(start)) {}
+
+  void AsyncReadSome(char *, std::size_t, TransferHandler) override { m_start(); }
+  void AsyncWrite(const char *, std::size_t, TransferHandler) override { m_start(); }
+  void Close() noexcept override {}
+
+private:
+  const std::function<void()> m_start;
+};
+
+TEST(SSLStream, EndsTheHandshakeOnceWhateverTheStreamBelowThrows) {
+  const std::string failed = "The TLS handshake with localhost failed: ";
+  struct Case {
+    std::function<void()> start;
+    std::string message;
+  };
+  for (const Case &thrown : {Case{[] { throw InvalidStateException("ours"); }, failed + "ours"},
+                             Case{[] { throw std::runtime_error("foreign"); }, failed + "foreign"},
+                             Case{[] { throw 1; }, failed + "an object that is not an exception was thrown"},
+                             Case{[] { throw std::bad_alloc(); }, "There is not enough memory"}}) {
+    const Ref<SSLStream> stream =
+        CreateTrustingContext()->CreateStream(MakeRef<ThrowingStream>(thrown.start), "localhost");
+    Completion handshake;
+    stream->AsyncHandshake("localhost", "", handshake.ForEnd());
+    EXPECT_EQ(handshake.GetMessage(), thrown.message);
+    stream->Close();
+    EXPECT_TRUE(Testing::DrainIoThreads());
+    EXPECT_EQ(handshake.GetCalls(), 1);
+  }
+}
 
 TEST(SSLStream, ReadsWhatTheServerSentAfterAWriteHasFailed) {
   std::promise<void> failed;
