@@ -44,6 +44,7 @@ HostProcess::HostProcess(int port, const std::vector<std::string> &deeds, const 
 }
 
 HostProcess::~HostProcess() {
+  const std::lock_guard<std::mutex> lock(m_mutex);
   close(m_input);
   close(m_output);
   if (m_process > 0) {
@@ -52,6 +53,7 @@ HostProcess::~HostProcess() {
 }
 
 void HostProcess::Continue() noexcept {
+  const std::lock_guard<std::mutex> lock(m_mutex);
   [[maybe_unused]] const ssize_t written = write(m_input, "x", 1);
 }
 

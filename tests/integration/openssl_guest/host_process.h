@@ -4,6 +4,7 @@
 
 #pragma once
 
+#include <mutex>
 #include <string>
 #include <vector>
 
@@ -22,7 +23,7 @@ public:
   HostProcess &operator=(const HostProcess &) = delete;
   ~HostProcess();
 
-  /// Lets it go on where it waits for its server.
+  /// Lets it go on where it waits for its server. On any thread.
   void Continue() noexcept;
 
   /// Waits for its end. What it wrote, and after that how it ended, unless that was well.
@@ -30,6 +31,7 @@ public:
 
 private:
   pid_t m_process = -1;
+  std::mutex m_mutex; // guards the end of m_input
   int m_input = -1;
   int m_output = -1;
 };
