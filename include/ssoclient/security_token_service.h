@@ -45,8 +45,8 @@ namespace SsoClient {
 /// holds an empty text in its place.
 class SSOCLIENT_API SecurityTokenService {
 public:
-  /// Told once how an operation ended: with the token (null as above) and null, or with null and the exception, which is
-  /// good during the call only (`Clone` keeps it).
+  /// Called once, at an operation's end: with the token (null as above) and null, or with null and the exception, which
+  /// is good during the call only (`Clone` keeps it).
   using TokenCompletion =
       std::function<void(const std::shared_ptr<const SamlToken> &token, const Tarvel::Exception *failure)>;
 
@@ -80,7 +80,7 @@ public:
   // The same operations on a thread of the platform's pool. They return at once, with nothing composed or sent yet, and
   // cannot be cancelled; the caller may release everything that it passed, the service included. The completion is called
   // exactly once, on a pool's thread, maybe before the call has returned. What it throws is logged by the pool, and so is,
-  // without a completion, anything thrown that is no `Tarvel::Exception` (memory that ran out, a handler's own class).
+  // without a completion, any exception that is not a `Tarvel::Exception` (memory that ran out, a handler's own class).
   // A null token or handler is reported as `Tarvel::InvalidArgumentException`.
   //
   // A completion must not wait for another asynchronous operation: the pool has at most 256 threads, and when a completion
@@ -90,31 +90,31 @@ public:
   // Each of them throws `Tarvel::InvalidStateException` when the pool has no thread and none can be started, and then calls
   // no completion.
 
-  /// `AcquireToken` on a thread of the pool. `completion` is not called when anything is thrown that is no
+  /// `AcquireToken` on a thread of the pool. `completion` is not called for an exception that is not a
   /// `Tarvel::Exception`, and must not wait for another asynchronous operation.
   virtual void AcquireTokenAsync(const std::string &username, const std::string &password, const TokenSpec &spec,
                                  const TokenCompletion &completion) const = 0;
 
-  /// `AcquireTokenByGSS` on a thread of the pool, on which the handler is called. `completion` is not called when anything
-  /// is thrown that is no `Tarvel::Exception`, by the handler, too; it must not wait for another asynchronous operation.
+  /// `AcquireTokenByGSS` on a thread of the pool, on which the handler is called. `completion` is not called for an
+  /// exception, also of the handler, that is not a `Tarvel::Exception`; it must not wait for another such operation.
   virtual void AcquireTokenByGssAsync(const TokenSpec &spec, const std::shared_ptr<NegotiationHandler> &handler,
                                       const TokenCompletion &completion) const = 0;
 
-  /// `AcquireTokenByCertificate` on a thread of the pool. `completion` is not called when anything is thrown that is no
+  /// `AcquireTokenByCertificate` on a thread of the pool. `completion` is not called for an exception that is not a
   /// `Tarvel::Exception`, and must not wait for another asynchronous operation.
   virtual void AcquireTokenByCertificateAsync(const TokenSpec &spec, const TokenCompletion &completion) const = 0;
 
-  /// `AcquireTokenByToken` on a thread of the pool. `completion` is not called when anything is thrown that is no
+  /// `AcquireTokenByToken` on a thread of the pool. `completion` is not called for an exception that is not a
   /// `Tarvel::Exception`, and must not wait for another asynchronous operation.
   virtual void AcquireTokenByTokenAsync(const std::shared_ptr<const SamlToken> &token, const TokenSpec &spec,
                                         const TokenCompletion &completion) const = 0;
 
-  /// `ValidateSubject` on a thread of the pool. `completion` is not called when anything is thrown that is no
+  /// `ValidateSubject` on a thread of the pool. `completion` is not called for an exception that is not a
   /// `Tarvel::Exception`, and must not wait for another asynchronous operation.
   virtual void ValidateSubjectAsync(const std::shared_ptr<const SamlToken> &token,
                                     const ValidityCompletion &completion) const = 0;
 
-  /// `RenewToken` on a thread of the pool. `completion` is not called when anything is thrown that is no
+  /// `RenewToken` on a thread of the pool. `completion` is not called for an exception that is not a
   /// `Tarvel::Exception`, and must not wait for another asynchronous operation.
   virtual void RenewTokenAsync(const std::shared_ptr<const SamlToken> &token, std::int64_t lifetimeSec,
                                const TokenCompletion &completion) const = 0;

@@ -2,6 +2,7 @@
 #include "token/statement_parser.h"
 
 #include "model/namespaces.h"
+#include "token/schema_names.h"
 #include "xml/qualified_name.h"
 #include "xml/strict_checks.h"
 
@@ -11,7 +12,6 @@
 namespace SsoClient {
 
 using Tarvel::Xml::ElementNode;
-using Tarvel::Xml::QName;
 
 namespace {
 
@@ -19,7 +19,7 @@ void ParseAttributeValue(NodeFilterIterator &iterator, std::string &value) {
   const ElementNode &element = RequireElementQName(IteratorToElement(iterator), "AttributeValue", Namespaces::SAML);
   // Services may say the type of a value. It is not looked at: every value is taken as text.
   if (element.GetFirstAttribute()) {
-    RequireElementAttributesQNames(element, {}, {QName(std::string(Namespaces::XSI), "type")});
+    RequireElementAttributesQNames(element, {}, {SchemaNames::XsiType()});
   }
   RequireTextualContent(iterator, value);
   iterator.MoveToSibling();

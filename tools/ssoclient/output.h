@@ -37,8 +37,8 @@ void WriteOutput(std::string_view text);
 /// One line on standard error, for what comes after the command's success.
 void Warn(std::string_view message);
 
-/// The same for what a failure may follow. In JSON there is none unless the caller wants to see more: a program expects
-/// the failure's object there, and nothing else.
+/// The same for what a failure may follow. In JSON nothing is written unless the caller wants to see more: a program
+/// expects the failure's object there, and nothing else.
 void Warn(std::string_view message, const OutputOptions &output);
 
 /// From now on each line that the library logs goes to standard error, as a line of its own.

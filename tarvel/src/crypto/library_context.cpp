@@ -56,8 +56,8 @@ void InitialiseOpenSsl() {
   const OpenSslErrorScope errors;
   const bool isOfSystem = Decide(Configuration::NONE) == Configuration::OF_SYSTEM;
   const std::uint64_t configurationFlag = isOfSystem ? OPENSSL_INIT_LOAD_CONFIG : OPENSSL_INIT_NO_LOAD_CONFIG;
-  // OpenSSL reads its configuration with the first context for TLS, unless it was told not to, which it heeds once for the
-  // whole process.
+  // OpenSSL reads its configuration with the first context for TLS, unless a flag forbids it. Only the first such flag
+  // of a process counts.
   const bool isUsable = OPENSSL_init_crypto(0, nullptr) == 1; // else it has cleaned itself up, or lacks memory
   if (!isUsable || OPENSSL_init_ssl(configurationFlag, nullptr) != 1) {
     static std::atomic<bool> lackedMemory{false}; // OpenSSL does not try again what has failed once

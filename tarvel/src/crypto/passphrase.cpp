@@ -35,8 +35,8 @@ const std::string &Passphrase::Get() {
   if (!m_asked) {
     m_asked = true;
     std::string answer = Ask();
-    m_text.assign(answer);
-    SecureWipe(answer); // a short text is not moved but copied: what is left of the answer is a secret too
+    m_text.swap(answer); // needs no memory, so that nothing is thrown before the answer is wiped
+    SecureWipe(answer);  // a short text is not moved but copied: what is left of the answer is a secret too
   }
   m_use.Require();
   return m_text;

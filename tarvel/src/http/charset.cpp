@@ -44,7 +44,7 @@ std::string TakeValue(std::string_view &rest) {
   std::size_t at = 1;
   for (; at < rest.size() && rest[at] != '"'; ++at) {
     if (rest[at] == '\\' && at + 1 < rest.size()) {
-      ++at; // the character behind it stands for itself
+      ++at; // the character after it is taken as it is
     }
     value.push_back(rest[at]);
   }
@@ -52,7 +52,7 @@ std::string TakeValue(std::string_view &rest) {
   return value;
 }
 
-/// The value of the encoding in the XML declaration that `text` begins with; empty when there is none.
+/// The value of the encoding in the XML declaration that `text` begins with; empty when there is no such value.
 std::string_view FindDeclaredEncoding(std::string_view text) {
   constexpr std::string_view BEGINNING = "<?xml";
   std::string_view rest = text.substr(0, MAX_DECLARATION_LENGTH);

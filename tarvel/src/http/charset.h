@@ -9,7 +9,7 @@
 
 namespace Tarvel::Http {
 
-/// The charset parameter of a media type (RFC 9110, section 8.3), as written but for its quotes. Empty when there is none,
+/// The charset parameter of a media type (RFC 9110, section 8.3), as written but for its quotes. Empty without one,
 /// and when it is not a charset's name: a token of at most 40 characters (RFC 2978, section 2.3).
 std::string FindCharset(std::string_view contentType);
 

@@ -45,12 +45,18 @@ Reader::~Reader() = default;
 std::string Reader::ReadToEnd(std::size_t maximumBytes) {
   std::string text;
   std::array<char, CHUNK_LENGTH> chunk;
-  while (text.size() <= maximumBytes) {
-    const std::size_t count = Read(chunk.data(), chunk.size());
-    if (count == 0) {
-      break;
+  try {
+    while (text.size() <= maximumBytes) {
+      const std::size_t count = Read(chunk.data(), chunk.size());
+      if (count == 0) {
+        break;
+      }
+      AppendWiping(text, {chunk.data(), count});
     }
-    AppendWiping(text, {chunk.data(), count});
+  } catch (...) {
+    SecureWipe(text);
+    SecureWipe(chunk.data(), chunk.size());
+    throw;
   }
   SecureWipe(chunk.data(), chunk.size());
   return text;

@@ -13,8 +13,6 @@ namespace System {
 
 namespace {
 
-/// Bytes of a refused text that its message repeats: the text may be as long as a document.
-
 constexpr int MAX_BIAS_HOURS = 14;
 
 constexpr bool IsDigit(char c) noexcept {

@@ -181,7 +181,7 @@ void AddThread(const std::shared_ptr<PoolState> &pool) {
   }
 }
 
-/// The first item that is queued; null when there is none.
+/// The first item that is queued; null when the queue is empty.
 Ref<WorkItem> GetFirstQueued(PoolState &pool) {
   const std::lock_guard<ForkSafeMutex> lock(pool.mutex);
   return pool.queue.empty() ? Ref<WorkItem>() : pool.queue.front();

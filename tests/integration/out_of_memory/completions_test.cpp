@@ -1,6 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 // A completion must be called however early memory runs out. This program replaces the allocation functions of C++, and
 // lets each allocation of an exchange fail in its turn. All of it runs on the test's thread, in one order.
+#include "support/refused_memory.h"
 #include "transport/https_session.h"
 
 #include <tarvel/core/exception.h>
@@ -9,7 +10,6 @@
 
 #include <gtest/gtest.h>
 
-#include <cstdlib>
 #include <cstring>
 #include <limits>
 #include <new>
@@ -26,37 +26,15 @@ thread_local long t_allocationsLeft = NEVER; // before the one that fails
 thread_local bool t_failsOnce = false;       // otherwise all that follow fail, too
 thread_local bool t_hasFailed = false;
 
-void *Allocate(std::size_t bytes) {
-  if (t_allocationsLeft != NEVER && t_allocationsLeft-- <= 0) {
-    t_allocationsLeft = t_failsOnce ? NEVER : 0;
-    t_hasFailed = true;
-    throw std::bad_alloc();
-  }
-  if (void *const memory = std::malloc(bytes ? bytes : 1)) {
-    return memory;
-  }
-  throw std::bad_alloc();
-}
-
 } // namespace
 
-void *operator new(std::size_t bytes) {
-  return Allocate(bytes);
-}
-void *operator new[](std::size_t bytes) {
-  return Allocate(bytes);
-}
-void operator delete(void *memory) noexcept {
-  std::free(memory);
-}
-void operator delete[](void *memory) noexcept {
-  std::free(memory);
-}
-void operator delete(void *memory, std::size_t) noexcept {
-  std::free(memory);
-}
-void operator delete[](void *memory, std::size_t) noexcept {
-  std::free(memory);
+bool Testing::IsMemoryRefused() noexcept {
+  if (t_allocationsLeft == NEVER || t_allocationsLeft-- > 0) {
+    return false;
+  }
+  t_allocationsLeft = t_failsOnce ? NEVER : 0;
+  t_hasFailed = true;
+  return true;
 }
 
 namespace SsoClient {

@@ -350,18 +350,24 @@ TEST_P(FreedMemory, HoldsNothingOfAResponseThatIsRefused) {
   }
 }
 
+enum class LastRead { ENDS, THROWS };
+
 /// Gives the text away in pieces, as a file does.
 class PieceReader final : public Tarvel::Reader {
 public:
-  explicit PieceReader(const std::string &text) : m_text(text) {}
+  PieceReader(const std::string &text, LastRead last) : m_text(text), m_last(last) {}
   std::size_t Read(char *buffer, std::size_t length) override {
     const std::size_t count = m_text.copy(buffer, std::min<std::size_t>(length, 1000), m_position);
+    if (count == 0 && m_last == LastRead::THROWS) {
+      throw Tarvel::IOException("broken");
+    }
     m_position += count;
     return count;
   }
 
 private:
   const std::string &m_text;
+  const LastRead m_last;
   std::size_t m_position = 0;
 };
 
@@ -373,12 +379,21 @@ TEST_P(FreedMemory, HoldsNothingOfATextThatWasReadOrParsed) {
     char buffer[7];
     Tarvel::CreateStringReader(text)->Read(buffer, sizeof buffer);
     Tarvel::SecureWipe(buffer, sizeof buffer);
-    std::string read = Tarvel::MakeRef<PieceReader>(text)->ReadToEnd(text.size());
+    std::string read = Tarvel::MakeRef<PieceReader>(text, LastRead::ENDS)->ReadToEnd(text.size());
     EXPECT_EQ(read, text);
     Tarvel::SecureWipe(read);
     Tarvel::Ref<Tarvel::Xml::Document> document;
     ParseXML(text, document);
     document.reset();
+    EXPECT_EQ(watch.Found(), 0);
+  }
+}
+
+TEST_P(FreedMemory, HoldsNothingOfATextThatCouldNotBeReadToItsEnd) {
+  for (const std::size_t padding : {std::size_t(0), std::size_t(200000)}) {
+    const std::string text = AnswerWithSecret(GetParam(), padding);
+    const Watch watch(GetParam());
+    EXPECT_THROW(Tarvel::MakeRef<PieceReader>(text, LastRead::THROWS)->ReadToEnd(text.size()), Tarvel::IOException);
     EXPECT_EQ(watch.Found(), 0);
   }
 }

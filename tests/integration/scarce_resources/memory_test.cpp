@@ -2,6 +2,7 @@
 // Memory that runs out at each place in turn: a completion is called once all the same, unless the start has thrown.
 #include "support/completion.h"
 #include "support/process_resources.h"
+#include "support/refused_memory.h"
 #include "support/scripted_server.h"
 #include "system/name_lookup.h"
 
@@ -14,7 +15,6 @@
 #include <array>
 #include <atomic>
 #include <cstdio>
-#include <cstdlib>
 #include <cstring>
 #include <functional>
 #include <new>
@@ -43,7 +43,9 @@ bool IsConcerned() noexcept {
   return isOfPlatform || isInStart;
 }
 
-bool IsRefused() noexcept {
+} // namespace
+
+bool Testing::IsMemoryRefused() noexcept {
   const Shortage shortage = g_shortage;
   if (shortage == Shortage::NONE || !IsConcerned()) {
     return false;
@@ -54,45 +56,11 @@ bool IsRefused() noexcept {
   return isRefused;
 }
 
-void *Allocate(std::size_t size) {
-  void *const piece = IsRefused() ? nullptr : std::malloc(size);
-  if (!piece) {
-    throw std::bad_alloc();
-  }
-  return piece;
-}
-
-} // namespace
-
-void *operator new(std::size_t size) {
-  return Allocate(size);
-}
-
-void *operator new[](std::size_t size) {
-  return Allocate(size);
-}
-
-void operator delete(void *piece) noexcept {
-  std::free(piece);
-}
-
-void operator delete(void *piece, std::size_t) noexcept {
-  std::free(piece);
-}
-
-void operator delete[](void *piece) noexcept {
-  std::free(piece);
-}
-
-void operator delete[](void *piece, std::size_t) noexcept {
-  std::free(piece);
-}
-
 // The linker calls this in place of the C library's function.
 void *RealAlignedAllocate(std::size_t alignment, std::size_t size) asm("__real_aligned_alloc");
 void *AlignedAllocate(std::size_t alignment, std::size_t size) asm("__wrap_aligned_alloc");
 void *AlignedAllocate(std::size_t alignment, std::size_t size) {
-  return IsRefused() ? nullptr : RealAlignedAllocate(alignment, size);
+  return Testing::IsMemoryRefused() ? nullptr : RealAlignedAllocate(alignment, size);
 }
 
 namespace Testing {

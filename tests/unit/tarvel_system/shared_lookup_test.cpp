@@ -28,7 +28,7 @@ using Testing::Eventually;
 using Testing::PATIENCE;
 using Testing::UnusedPort;
 
-/// Stands for the resolver. Names that are held get no answer until they are released; every name has the address
+/// Replaces the resolver. Names that are held get no answer until they are released; every name has the address
 /// 127.0.0.1, or the failure that is set.
 class ResolverStandIn {
 public:

@@ -29,7 +29,8 @@ class TARVEL_API TimeoutException : public NetworkException {
 
 /// A connected stream of bytes, driven asynchronously. A completion is called exactly once for each start that returns,
 /// whatever goes wrong, and never inside the starting call (though perhaps before it has returned). A start throws
-/// `std::bad_alloc` when there is no memory to begin with, and nothing else; its completion is not called then.
+/// `std::bad_alloc` when there is no memory to begin with, and, in a child process made by `fork`, `InvalidStateException` when
+/// the I/O threads get no thread or descriptor; nothing else. Its completion is not called then.
 ///
 /// Completions run on the platform's I/O threads, of which all that is pending in the process shares two. They must not
 /// block, nor wait for another operation, synchronous or asynchronous: start the next one from the completion, and queue

@@ -1,0 +1,44 @@
+// SPDX-License-Identifier: Apache-2.0
+/// @file
+/// Memory that a test refuses to C++ code. This header replaces the allocation functions of C++: exactly one source file of a
+/// program includes it, and defines `IsMemoryRefused`.
+
+#pragma once
+
+#include <cstddef>
+#include <cstdlib>
+#include <new>
+
+namespace Testing {
+
+/// Called for each allocation, on its thread: whether it fails. Must not allocate.
+bool IsMemoryRefused() noexcept;
+
+inline void *AllocateUnlessRefused(std::size_t bytes) {
+  void *const memory = IsMemoryRefused() ? nullptr : std::malloc(bytes ? bytes : 1);
+  if (!memory) {
+    throw std::bad_alloc();
+  }
+  return memory;
+}
+
+} // namespace Testing
+
+void *operator new(std::size_t bytes) {
+  return Testing::AllocateUnlessRefused(bytes);
+}
+void *operator new[](std::size_t bytes) {
+  return Testing::AllocateUnlessRefused(bytes);
+}
+void operator delete(void *memory) noexcept {
+  std::free(memory);
+}
+void operator delete[](void *memory) noexcept {
+  std::free(memory);
+}
+void operator delete(void *memory, std::size_t) noexcept {
+  std::free(memory);
+}
+void operator delete[](void *memory, std::size_t) noexcept {
+  std::free(memory);
+}
