@@ -83,8 +83,8 @@ std::string Printable(std::string_view text) {
   return out;
 }
 
-std::string PrintableLine(std::string_view text) {
-  return Tarvel::StringUtil::Shorten(Printable(text), Tarvel::StringUtil::MAX_LINE_BYTES);
+std::string PrintableValue(std::string_view text) {
+  return Tarvel::StringUtil::Shorten(Printable(text));
 }
 
 std::string ReadInput(const std::string &path, std::size_t limit) {
@@ -114,7 +114,7 @@ void WriteOutput(std::string_view text) {
 }
 
 void Warn(std::string_view message) {
-  const std::string line = "ssoclient: warning: " + PrintableLine(message) + "\n";
+  const std::string line = "ssoclient: warning: " + PrintableValue(message) + "\n";
   std::fputs(line.c_str(), stderr);
 }
 
@@ -126,7 +126,9 @@ void Warn(std::string_view message, const OutputOptions &output) {
 
 void ShowLibraryLog() {
   Tarvel::Service::GetApp().GetRootLogger()->SetSink([](const Tarvel::Service::LogRecord &record) {
-    const std::string line = "ssoclient: log: " + PrintableLine(record.message) + "\n";
+    // Cut before; what is escaped is longer.
+    const std::string text = Tarvel::StringUtil::Shorten(Printable(record.message), Tarvel::StringUtil::MAX_LINE_BYTES);
+    const std::string line = "ssoclient: log: " + text + "\n";
     std::fputs(line.c_str(), stderr);
   });
 }
@@ -142,7 +144,7 @@ void ReportFailure(const std::exception &failure, Format format) {
     }
     lines = Json(json) + "\n";
   } else {
-    lines = "ssoclient: " + std::string(known.label) + ": " + PrintableLine(failure.what()) + "\n";
+    lines = "ssoclient: " + std::string(known.label) + ": " + PrintableValue(failure.what()) + "\n";
     if (hinted) {
       lines += "ssoclient: hint: " + hinted->GetHint() + "\n";
     }

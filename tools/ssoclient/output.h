@@ -23,8 +23,8 @@ struct OutputOptions {
 /// characters, line and paragraph separators, and the characters that turn the direction of text. `text` is UTF-8.
 std::string Printable(std::string_view text);
 
-/// The same, cut at the length of a line (`Tarvel::StringUtil::MAX_LINE_BYTES`).
-std::string PrintableLine(std::string_view text);
+/// The same, cut at the length of a value (`Tarvel::StringUtil::MAX_VALUE_BYTES`).
+std::string PrintableValue(std::string_view text);
 
 /// The octets of the file `path`, or of standard input when it is "-", at most `limit` of them.
 /// @throws Tarvel::IOException naming the path.

@@ -88,7 +88,7 @@ public:
   void Add(std::string_view label, std::string_view value) {
     m_text += label;
     m_text.append(label.size() < COLUMN ? COLUMN - label.size() : 1, ' ');
-    m_text += PrintableLine(value);
+    m_text += PrintableValue(value);
     m_text += '\n';
   }
   void AddFlag(std::string_view label, bool value) { Add(label, value ? "yes" : "no"); }
