@@ -126,7 +126,7 @@ void Warn(std::string_view message, const OutputOptions &output) {
 
 void ShowLibraryLog() {
   Tarvel::Service::GetApp().GetRootLogger()->SetSink([](const Tarvel::Service::LogRecord &record) {
-    // Cut before; what is escaped is longer.
+    // The logger has cut it, but what is escaped is longer than it was.
     const std::string text = Tarvel::StringUtil::Shorten(Printable(record.message), Tarvel::StringUtil::MAX_LINE_BYTES);
     const std::string line = "ssoclient: log: " + text + "\n";
     std::fputs(line.c_str(), stderr);
