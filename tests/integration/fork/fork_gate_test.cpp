@@ -102,6 +102,38 @@ TEST(ForkGate, AThreadForksWithinItsOwnComputation) {
             "");
 }
 
+TEST(ForkGate, TwoThreadsForkWithinTheirOwnComputationsAtOnce) {
+  const auto forkOften = [] {
+    for (int i = 0; i < FORKS / 10; ++i) {
+      const Computation computing;
+      EXPECT_EQ(RunInChild([] {}), "");
+    }
+  };
+  std::thread other(forkOften);
+  forkOften();
+  other.join();
+}
+
+// As a module of OpenSSL may do that starts a program under a lock of its own.
+TEST(ForkGate, AForkWithinAComputationDoesNotWaitForAThreadThatWaitsForWhatItHolds) {
+  std::mutex held;
+  Testing::EventCount waiting;
+  std::unique_lock<std::mutex> lock(held);
+  std::thread other([&] {
+    const Computation computing;
+    waiting.Add();
+    const std::lock_guard<std::mutex> later(held);
+  });
+  ASSERT_TRUE(waiting.WaitFor(1));
+  {
+    const Computation computing;
+    EXPECT_EQ(RunInChild([] {}), "");
+  }
+  lock.unlock();
+  other.join();
+  EXPECT_EQ(RunInChild([] { Compute(); }), "") << "later forks find nothing left behind";
+}
+
 TEST(ForkGate, NoChildFindsALockedMutexHoweverBusyTheThreadsAre) {
   ForkSafeMutex mutex;
   std::atomic<bool> stop{false};
