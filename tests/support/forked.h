@@ -4,12 +4,18 @@
 
 #pragma once
 
+#include "support/sanitized.h"
+
 #include <functional>
 #include <new>
 #include <string>
 #include <sys/types.h>
 
 namespace Testing {
+
+/// Whether a child has memory to work with though other threads of its parent may allocate in the moment of the fork. The
+/// C library sees to that. AddressSanitizer's allocator does not: its locks may stay locked in the child.
+constexpr bool MAY_FORK_WHILE_OTHERS_ALLOCATE = !IS_SANITIZED;
 
 /// What became of a child: "" when its body ran to the end and all that it expected was so, else what ended it.
 using ChildOutcome = std::string;

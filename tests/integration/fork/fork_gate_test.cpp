@@ -103,6 +103,9 @@ TEST(ForkGate, AThreadForksWithinItsOwnComputation) {
 }
 
 TEST(ForkGate, AThreadForksWithinItsComputationWhileAnotherForkWaitsForIt) {
+  if (!Testing::MAY_FORK_WHILE_OTHERS_ALLOCATE) {
+    GTEST_SKIP() << "the sanitizer's allocator may stay locked in the child";
+  }
   Testing::EventCount begun;
   std::thread within([&begun] {
     const Computation computing;
@@ -160,6 +163,9 @@ TEST(ForkGate, NoChildFindsALockedMutexHoweverBusyTheThreadsAre) {
 }
 
 TEST(ForkGate, TwoThreadsForkAtOnce) {
+  if (!Testing::MAY_FORK_WHILE_OTHERS_ALLOCATE) {
+    GTEST_SKIP() << "the sanitizer's allocator may stay locked in the child";
+  }
   ForkSafeMutex mutex;
   const auto forkOften = [&] {
     for (int i = 0; i < FORKS / 10; ++i) {
