@@ -84,6 +84,19 @@ std::string_view FindDeclaredEncoding(std::string_view text) {
   }
 }
 
+/// ISO-8859-1 has the first 256 characters of Unicode, each as one byte.
+void AppendAsUtf8(std::string &out, std::string_view latin1) {
+  for (const char c : latin1) {
+    const auto byte = static_cast<unsigned char>(c);
+    if (IsBeyondAscii(c)) {
+      out.push_back(static_cast<char>(0xC0 | byte >> 6));
+      out.push_back(static_cast<char>(0x80 | (byte & 0x3F)));
+    } else {
+      out.push_back(c);
+    }
+  }
+}
+
 } // namespace
 
 std::string FindCharset(std::string_view contentType) {
@@ -121,17 +134,11 @@ void RecodeToUtf8(std::string &body, std::string_view charset) {
   constexpr std::string_view UTF8 = "UTF-8"; // shorter than the names that it replaces, or not much longer
   std::string recoded;
   recoded.reserve(body.size() + static_cast<std::size_t>(beyondAscii) + UTF8.size());
+  const std::string_view whole = body;
   const std::size_t end = isDeclared ? static_cast<std::size_t>(declared.data() - body.data()) : 0;
-  recoded.append(body, 0, end).append(isDeclared ? UTF8 : "");
-  for (const char c : std::string_view(body).substr(end + (isDeclared ? declared.size() : 0))) {
-    const auto byte = static_cast<unsigned char>(c);
-    if (IsBeyondAscii(c)) {
-      recoded.push_back(static_cast<char>(0xC0 | byte >> 6));
-      recoded.push_back(static_cast<char>(0x80 | (byte & 0x3F)));
-    } else {
-      recoded.push_back(c);
-    }
-  }
+  AppendAsUtf8(recoded, whole.substr(0, end));
+  recoded.append(isDeclared ? UTF8 : "");
+  AppendAsUtf8(recoded, whole.substr(end + (isDeclared ? declared.size() : 0)));
   body.swap(recoded);
   SecureWipe(recoded);
 }

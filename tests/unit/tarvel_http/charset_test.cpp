@@ -63,6 +63,11 @@ TEST(RecodeToUtf8, RecodesEachByte) {
   EXPECT_EQ(Recoded(latin1, "ISO-8859-1"), utf8);
 }
 
+TEST(RecodeToUtf8, RecodesWhatIsBeforeTheDeclaredEncoding) {
+  EXPECT_EQ(Recoded("<?xml \xE1='1' encoding='latin1'?><a>\xFC</a>", "ISO-8859-1"),
+            "<?xml \xC3\xA1='1' encoding='UTF-8'?><a>\xC3\xBC</a>");
+}
+
 TEST(RecodeToUtf8, LeavesUtf8AsItIs) {
   const std::string utf8 = "<?xml version='1.0' encoding='ISO-8859-1'?><a>\xC3\xBC</a>";
   EXPECT_EQ(Recoded(utf8, "ISO-8859-1"), utf8);
