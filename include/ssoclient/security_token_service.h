@@ -22,7 +22,7 @@ namespace SsoClient {
 
 /// Acquires, renews and validates tokens. Immutable: any number of threads may use one service at once. Always held by
 /// the shared pointer that `CreateSecurityTokenService` made. A child process made by `fork` may use the services of its
-/// parent, also when the parent has operations under way: these go on in the parent alone, and no completion of theirs
+/// parent, also when the parent has operations under way: these go on in the parent alone, and none of their completions
 /// runs in the child.
 ///
 /// The operations without "Async" run on the caller's thread, which waits up to four minutes for each message, and raise

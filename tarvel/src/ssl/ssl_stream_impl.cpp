@@ -287,8 +287,8 @@ void SSLStreamImpl::AdvanceOnIoThread(Step step) noexcept {
   }
 }
 
-// Perhaps while another thread drops the last reference, so there is none to be taken here. As long as something is pending,
-// an operation below has one, or a step that has been posted.
+// Another thread may be dropping the last reference, so this must not take one. As long as something is pending, an operation
+// below holds a reference, or a step that has been posted does.
 void SSLStreamImpl::OnOpenSslEnd(void *stream) noexcept {
   auto &self = *static_cast<SSLStreamImpl *>(stream);
   {

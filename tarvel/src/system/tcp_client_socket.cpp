@@ -60,7 +60,7 @@ std::string WithoutBrackets(const std::string &host) {
   return host.size() > 2 && host.front() == '[' && host.back() == ']' ? host.substr(1, host.size() - 2) : host;
 }
 
-/// The address that `host` is; unspecific, with an error, when it is none.
+/// `host` as an address; unspecified, with an error, when it is a name.
 asio::ip::address ParseAddress(const std::string &host, error_code &error) {
   return asio::ip::make_address(WithoutBrackets(host), error);
 }

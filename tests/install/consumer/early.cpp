@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// A program of someone who has only the installed package, with a static object that verifies a token before main: TOKEN
+/// A program that is built against the installed package alone, with a static object that verifies a token before main: TOKEN
 /// by CERTIFICATE, both of the environment. Prints who the token speaks for.
 
 #include <ssoclient/create_saml_token.h>

@@ -91,7 +91,7 @@ std::string Acquire(const SecurityTokenService &service, const std::string &user
   return service.AcquireToken(user, "pass", Spec())->GetSubject().ToString();
 }
 
-/// What the completion of one asynchronous operation is told.
+/// What the completion of one asynchronous operation was called with.
 class Told {
 public:
   SecurityTokenService::TokenCompletion ForToken() const {
