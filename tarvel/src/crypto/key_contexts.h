@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// Verification contexts that are ready for use, kept with the certificate whose key they hold.
+/// Contexts that are set up to check or to make signatures, kept with the certificate or the private key that they use.
 
 #pragma once
 
@@ -14,14 +14,15 @@
 
 namespace Tarvel::Crypto {
 
-/// Setting a verification context up costs a fifth of an RSA check, and a context is for one thread at a time: so a
-/// thread takes one out, uses it and puts it back, the one of its own lane if it is there. Lock-free; safe on any thread.
-class VerifyContexts {
+/// Contexts of one operation, checking or making signatures, and of one key. To set one up costs a fifth of an RSA check,
+/// and a context is for one thread at a time: so a thread takes one out, uses it and puts it back, the one of its own lane
+/// if it is there. Lock-free; safe on any thread.
+class KeyContexts {
 public:
-  VerifyContexts() = default;
-  VerifyContexts(const VerifyContexts &) = delete;
-  VerifyContexts &operator=(const VerifyContexts &) = delete;
-  ~VerifyContexts();
+  KeyContexts() = default;
+  KeyContexts(const KeyContexts &) = delete;
+  KeyContexts &operator=(const KeyContexts &) = delete;
+  ~KeyContexts();
 
   /// A context set up for `scheme` and `algorithm`; null when there is none at hand.
   KeyContextHandle Take(SignatureScheme scheme, DigestAlgorithm algorithm) noexcept;
@@ -32,7 +33,7 @@ public:
 private:
   static constexpr std::size_t SCHEMES = 3;
   static constexpr std::size_t ALGORITHMS = 3;
-  static constexpr std::size_t LANES = 4; // threads beyond these that use one certificate at once set up their own
+  static constexpr std::size_t LANES = 4; // threads beyond these that use one key at once set up their own
 
   struct alignas(System::LANE_ALIGNMENT) Lane {
     std::array<std::atomic<EVP_PKEY_CTX *>, SCHEMES * ALGORITHMS> contexts{};

@@ -1,10 +1,10 @@
 // SPDX-License-Identifier: Apache-2.0
 
-#include "crypto/verify_contexts.h"
+#include "crypto/key_contexts.h"
 
 namespace Tarvel::Crypto {
 
-VerifyContexts::~VerifyContexts() {
+KeyContexts::~KeyContexts() {
   for (Lane &lane : m_lanes) {
     for (std::atomic<EVP_PKEY_CTX *> &slot : lane.contexts) {
       const KeyContextHandle freed(slot.load(std::memory_order_relaxed));
@@ -12,13 +12,13 @@ VerifyContexts::~VerifyContexts() {
   }
 }
 
-std::atomic<EVP_PKEY_CTX *> &VerifyContexts::GetSlot(std::size_t lane, SignatureScheme scheme,
-                                                     DigestAlgorithm algorithm) noexcept {
+std::atomic<EVP_PKEY_CTX *> &KeyContexts::GetSlot(std::size_t lane, SignatureScheme scheme,
+                                                  DigestAlgorithm algorithm) noexcept {
   const std::size_t kind = static_cast<std::size_t>(scheme) * ALGORITHMS + static_cast<std::size_t>(algorithm);
   return m_lanes[(System::GetThreadLane(LANES) + lane) % LANES].contexts[kind];
 }
 
-KeyContextHandle VerifyContexts::Take(SignatureScheme scheme, DigestAlgorithm algorithm) noexcept {
+KeyContextHandle KeyContexts::Take(SignatureScheme scheme, DigestAlgorithm algorithm) noexcept {
   for (std::size_t lane = 0; lane < LANES; ++lane) {
     std::atomic<EVP_PKEY_CTX *> &slot = GetSlot(lane, scheme, algorithm);
     if (!slot.load(std::memory_order_relaxed)) {
@@ -31,7 +31,7 @@ KeyContextHandle VerifyContexts::Take(SignatureScheme scheme, DigestAlgorithm al
   return nullptr;
 }
 
-void VerifyContexts::Put(SignatureScheme scheme, DigestAlgorithm algorithm, KeyContextHandle context) noexcept {
+void KeyContexts::Put(SignatureScheme scheme, DigestAlgorithm algorithm, KeyContextHandle context) noexcept {
   for (std::size_t lane = 0; lane < LANES; ++lane) {
     EVP_PKEY_CTX *expected = nullptr;
     if (GetSlot(lane, scheme, algorithm)
