@@ -99,6 +99,19 @@ TEST(CreateTextNode, MakesAnEmptyTextThatTakesValues) {
   }
 }
 
+TEST(SetValue, NamesTheByteOfAForbiddenCharacterWhereverItIs) {
+  Ref<TextNode> text;
+  CreateTextNode(text);
+  for (std::size_t before = 0; before < 20; ++before) {
+    const std::string byte = std::to_string(before + 1);
+    EXPECT_THROWS_MESSAGE(
+        text->SetValue(std::string(before, ' ') + "\x1F" + std::string(20 - before, '\x7F')), InvalidArgumentException,
+        "Invalid argument : the text holds the character U+001F at byte " + byte + ", which XML 1.0 cannot carry");
+    EXPECT_THROWS_MESSAGE(text->SetValue(std::string(before, '!') + "\x80" + std::string(20 - before, 'x')),
+                          InvalidArgumentException, "Invalid argument : the text is not UTF-8 at byte " + byte);
+  }
+}
+
 struct Forbidden {
   std::string value;
   std::string message; // behind what names the text
