@@ -56,6 +56,15 @@ TEST(WriteTo, WritesMoreThanItsBufferHolds) {
   EXPECT_TRUE(WriteAgain(text) == text);
 }
 
+TEST(WriteTo, WritesPiecesOfEveryLengthAroundThatOfItsBuffer) {
+  for (const std::size_t around : {8192U, 16384U}) {
+    for (std::size_t length = around - 20; length <= around + 20; ++length) {
+      const std::string text = "<a><b>" + std::string(length, 'x') + "</b><c>" + std::string(10'000, 'y') + "</c></a>";
+      EXPECT_TRUE(WriteAgain(text) == text) << length;
+    }
+  }
+}
+
 std::string WriteInAscii(const ElementNode &element) {
   const Ref<StringWriter> writer = CreateStringWriter();
   element.WriteTo(*writer, CharacterForm::REFERENCES);
