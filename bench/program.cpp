@@ -66,6 +66,11 @@ std::string TakeOption(std::vector<std::string> &arguments, const std::string &n
 
 void Run(const Program &program, std::vector<std::string> arguments) {
   const std::string json = TakeOption(arguments, "--json");
+  const auto quick = std::find(arguments.begin(), arguments.end(), "--quick");
+  if (quick != arguments.end()) {
+    *quick = "--benchmark_repetitions=2";
+    arguments.emplace_back("--benchmark_min_time=0.001");
+  }
   program.registerBenchmarks();
   const Medians medians = RunInterleaved(arguments);
   if (json.empty()) {

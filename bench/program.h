@@ -30,7 +30,7 @@ struct Program {
 
 /// What `main` does: runs all registered benchmarks, their repetitions shuffled among each other so that a slow spell of
 /// the machine falls on all of them, prints the figures to standard output and writes the summary there, or to the file
-/// that the option --json names. Google Benchmark's own options are obeyed.
+/// that the option --json names. With --quick each runs for a moment only. Google Benchmark's own options are obeyed.
 /// @returns what `main` returns; a failure is told on standard error.
 int RunProgram(const Program &program, int argc, char **argv);
 

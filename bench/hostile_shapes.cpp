@@ -1,0 +1,200 @@
+// SPDX-License-Identifier: Apache-2.0
+/// @file
+/// What hostile documents cost until `CreateSamlToken` refuses or accepts them, for each octet, beside a genuine token of
+/// 5 MB.
+
+#include "counted_heap.h"
+#include "hostile_documents.h"
+#include "program.h"
+
+#include <ssoclient/create_saml_token.h>
+
+#include <algorithm>
+#include <array>
+#include <cstdio>
+#include <cstdlib>
+#include <ctime>
+#include <exception>
+#include <fstream>
+#include <iostream>
+#include <ostream>
+#include <stdexcept>
+#include <string>
+#include <string_view>
+#include <vector>
+
+namespace Bench {
+
+namespace {
+
+constexpr std::size_t KIB = 1024;
+constexpr std::size_t MIB = 1024 * KIB;
+
+/// A document that takes longer is read only once, and its shape not tried in the next size: its growth is known by then.
+constexpr double TOO_LONG_SECONDS = 2;
+
+constexpr std::size_t OUTCOME_LENGTH = 90; // of a line's
+
+struct Settings {
+  std::array<std::size_t, 3> sizes{1 * MIB, 4 * MIB, 16 * MIB};
+  int rounds = 3; // of which the fastest counts
+  std::string json;
+};
+
+struct Cost {
+  double nanosecondsPerOctet = 0;
+  std::size_t heapOctets = 0; // at most at once, beyond the text
+  std::string refusal;        // empty when it is accepted, for what is put in need not be signed
+};
+
+double CpuSeconds() {
+  std::timespec now{};
+  ::clock_gettime(CLOCK_PROCESS_CPUTIME_ID, &now);
+  return static_cast<double>(now.tv_sec) + static_cast<double>(now.tv_nsec) * 1e-9;
+}
+
+Cost MeasureOnce(const std::string &xml, const Tarvel::Crypto::CertificateList &trusted) {
+  Cost cost;
+  const std::size_t heapBefore = StartCountingHeap();
+  const double before = CpuSeconds();
+  try {
+    SsoClient::CreateSamlToken(xml, trusted);
+  } catch (const std::exception &error) {
+    cost.refusal = error.what();
+  }
+  cost.nanosecondsPerOctet = (CpuSeconds() - before) * 1e9 / static_cast<double>(xml.size());
+  cost.heapOctets = GetMostHeap() - heapBefore;
+  return cost;
+}
+
+bool TookTooLong(const Cost &cost, const std::string &xml) {
+  return cost.nanosecondsPerOctet * static_cast<double>(xml.size()) > TOO_LONG_SECONDS * 1e9;
+}
+
+Cost Measure(const std::string &xml, const Tarvel::Crypto::CertificateList &trusted, int rounds) {
+  Cost best = MeasureOnce(xml, trusted);
+  for (int round = 1; round < rounds && !TookTooLong(best, xml); ++round) {
+    const Cost cost = MeasureOnce(xml, trusted);
+    best.nanosecondsPerOctet = std::min(best.nanosecondsPerOctet, cost.nanosecondsPerOctet);
+  }
+  return best;
+}
+
+/// The worst of something, and whose it is.
+struct Worst {
+  double value = 0;
+  std::string shape;
+
+  void Note(double candidate, const std::string &name) {
+    if (candidate > value) {
+      value = candidate;
+      shape = name;
+    }
+  }
+};
+
+struct Summary {
+  double genuine = 0; // nanoseconds an octet
+  Worst ratio;        // to the genuine token's cost for each octet, of any size
+  Worst growth;       // of the cost for each octet, from the smallest size to the largest
+  Worst heap;         // octets
+  std::size_t shapes = 0;
+};
+
+void MeasureShape(const HostileShape &shape, const Tarvel::Crypto::CertificateList &trusted, const Settings &settings,
+                  Summary &summary) {
+  std::printf("%-72s", shape.name.c_str());
+  double first = 0;
+  Cost cost;
+  for (const std::size_t size : settings.sizes) {
+    const std::string xml = shape.make(size);
+    cost = Measure(xml, trusted, settings.rounds);
+    first = first == 0 ? cost.nanosecondsPerOctet : first;
+    summary.ratio.Note(cost.nanosecondsPerOctet / summary.genuine, shape.name);
+    summary.growth.Note(cost.nanosecondsPerOctet / first, shape.name);
+    summary.heap.Note(static_cast<double>(cost.heapOctets), shape.name);
+    std::printf(" %9.2f", cost.nanosecondsPerOctet);
+    if (TookTooLong(cost, xml)) {
+      break;
+    }
+  }
+  std::printf(" %6.1f MiB  %s\n", static_cast<double>(cost.heapOctets) / MIB,
+              cost.refusal.empty() ? "accepted" : cost.refusal.substr(0, OUTCOME_LENGTH).c_str());
+  std::fflush(stdout);
+  ++summary.shapes;
+}
+
+Summary MeasureAll(const Settings &settings) {
+  Tarvel::Crypto::CertificateList trusted;
+  for (const char *const file : {"/sts-rsa.crt", "/sts-rsa-2.crt", "/sts-ec256.crt", "/other.crt"}) {
+    trusted.push_back(Tarvel::Crypto::LoadCertificates(std::string(TOKEN_DATA_DIR) + file).front());
+  }
+  Summary summary;
+  const Cost genuine = Measure(ReadFile(LARGE_TOKEN), trusted, settings.rounds + 2);
+  if (!genuine.refusal.empty()) {
+    throw std::runtime_error("the genuine token is refused: " + genuine.refusal);
+  }
+  summary.genuine = genuine.nanosecondsPerOctet;
+  std::printf("%-72s %9.2f %26.1f MiB\n", "a genuine token of 5 MB, ns an octet and heap", summary.genuine,
+              static_cast<double>(genuine.heapOctets) / MIB);
+  for (const HostileShape &shape : MakeHostileShapes(ReadFile(TOKEN_DATA_DIR "/bearer.xml"))) {
+    MeasureShape(shape, trusted, settings, summary);
+  }
+  return summary;
+}
+
+void WriteWorst(const char *name, double value, const std::string &shape, std::ostream &out) {
+  out << ",\n  \"" << name << "\": {\"value\": " << value << ", \"shape\": \"" << shape << "\"}";
+}
+
+void WriteSummary(const Summary &summary, std::ostream &out) {
+  out << "{\n\"hostile_shapes\": {\"ratio\": " << summary.ratio.value << ", \"shapes\": " << summary.shapes
+      << ", \"genuine_ns_per_octet\": " << summary.genuine;
+  WriteWorst("worst_ratio", summary.ratio.value, summary.ratio.shape, out);
+  WriteWorst("worst_growth", summary.growth.value, summary.growth.shape, out);
+  WriteWorst("worst_heap_mib", summary.heap.value / MIB, summary.heap.shape, out);
+  out << "}\n}\n";
+}
+
+Settings ReadArguments(const std::vector<std::string> &arguments) {
+  Settings settings;
+  for (std::size_t i = 0; i < arguments.size(); ++i) {
+    if (arguments[i] == "--quick") {
+      settings.sizes = {16 * KIB, 32 * KIB, 64 * KIB};
+      settings.rounds = 1;
+    } else if (arguments[i] == "--json" && i + 1 < arguments.size()) {
+      settings.json = arguments[++i];
+    } else {
+      throw std::runtime_error("usage: hostile_shapes [--json FILE] [--quick]");
+    }
+  }
+  return settings;
+}
+
+void Run(const std::vector<std::string> &arguments) {
+  const Settings settings = ReadArguments(arguments);
+  const Summary summary = MeasureAll(settings);
+  if (settings.json.empty()) {
+    WriteSummary(summary, std::cout);
+    return;
+  }
+  std::ofstream file(settings.json);
+  WriteSummary(summary, file);
+  if (!file.flush()) {
+    throw std::runtime_error("cannot write " + settings.json);
+  }
+}
+
+} // namespace
+
+} // namespace Bench
+
+int main(int argc, char **argv) {
+  try {
+    Bench::Run({argv + 1, argv + argc});
+    return EXIT_SUCCESS;
+  } catch (const std::exception &error) {
+    std::cerr << "hostile_shapes: " << error.what() << '\n';
+    return EXIT_FAILURE;
+  }
+}
