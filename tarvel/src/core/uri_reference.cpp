@@ -89,7 +89,7 @@ std::string_view Take(std::string_view &text, std::string_view stops) noexcept {
 /// The scheme at the start of `text`, which is followed by a ":".
 std::optional<std::string_view> FindScheme(std::string_view text) noexcept {
   const std::size_t length = CountWhile(text, SCHEME);
-  if (length == 0 || length == text.size() || text[length] != ':' || !Is(text.front(), ALPHA)) {
+  if (length == text.size() || text[length] != ':' || !Is(text.front(), ALPHA)) {
     return std::nullopt;
   }
   return text.substr(0, length);
@@ -116,11 +116,11 @@ bool SplitAuthority(std::string_view authority, UriReference &parts) noexcept {
          ConsistsOfEscapedOr(parts.userInformation.value_or(""), USER);
 }
 
-/// Whether the path is one. Without scheme and authority its first part has no ":", which would end a scheme.
+/// Whether the path is one. Without a scheme its first part has no ":", which would end a scheme; after an authority that
+/// part is empty.
 bool IsPath(const UriReference &parts) noexcept {
-  const bool mayHaveColon = parts.scheme || parts.host;
   const std::string_view first = parts.path.substr(0, parts.path.find('/'));
-  return ConsistsOfEscapedOr(parts.path, PATH) && (mayHaveColon || first.find(':') == NPOS);
+  return ConsistsOfEscapedOr(parts.path, PATH) && (parts.scheme || first.find(':') == NPOS);
 }
 
 bool IsIPv6Address(std::string_view text) noexcept {

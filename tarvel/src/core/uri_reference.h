@@ -21,7 +21,7 @@ struct UriReference {
   std::optional<std::string_view> fragment; ///< without the "#"
 };
 
-/// Takes `text` apart, in one pass, without allocation. Judges everything but what an IP literal has between its brackets,
+/// Takes `text` apart, in linear time, without allocation. Judges everything but what an IP literal has between its brackets,
 /// so that a caller that accepts fewer addresses can refuse them with its own message.
 /// @return nothing when `text` is not a URI reference.
 std::optional<UriReference> SplitUriReference(std::string_view text) noexcept;

@@ -89,9 +89,9 @@ TEST(IsUriReference, RefusesACharacterThatNoPartMayHave) {
   for (const char *const before : {"", "x:", "x://", "x://h/", "x:?", "x:#"}) {
     for (int code = 0; code < 256; ++code) {
       const char c = static_cast<char>(code);
-      const bool isRefused = code <= ' ' || code >= 0x7F || "\"<>\\^`{|}%"sv.find(c) != std::string_view::npos;
+      const bool isRefused = code <= ' ' || code >= 0x7F || "\"<>\\^`{|}"sv.find(c) != std::string_view::npos;
       if (isRefused) {
-        EXPECT_FALSE(IsUriReference(before + std::string(1, c) + "4")) << before << " and character " << code;
+        EXPECT_FALSE(IsUriReference(before + std::string(1, c) + "41")) << before << " and character " << code;
       }
     }
   }
@@ -102,7 +102,7 @@ TEST(IsUriReference, RefusesAnEscapeWithoutTwoHexadecimalDigits) {
     for (const char *const escape : {"%", "%4", "%4g", "%g4", "%%41", "%4%41", "%/41"}) {
       EXPECT_FALSE(IsUriReference(std::string(before) + escape)) << before << escape;
     }
-    for (const char *const escape : {"%41", "%aF", "%00", "%41%42", "a%41b"}) {
+    for (const char *const escape : {"%41", "%aF", "%00", "%bC%De", "a%41b"}) {
       EXPECT_TRUE(IsUriReference(std::string(before) + escape)) << before << escape;
     }
   }
