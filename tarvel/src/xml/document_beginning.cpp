@@ -84,6 +84,13 @@ void ReadDeclaration(SourceCursor &cursor) {
   declaration.End();
 }
 
+/// Whether the name of a target, of which "<?xml" may be the beginning only, goes on with `rest`: "<?xml-stylesheet" begins
+/// an instruction.
+bool GoesOn(std::string_view rest) noexcept {
+  return !rest.empty() &&
+         (IsOfClass(rest.front(), NAME) || rest.front() == ':' || static_cast<unsigned char>(rest.front()) >= 0x80);
+}
+
 void CheckFirstBytes(const SourceCursor &cursor) {
   using namespace std::string_view_literals;
   const std::string_view source = cursor.GetSource();
@@ -114,9 +121,7 @@ void ReadDocumentBeginning(SourceCursor &cursor) {
   if (cursor.IsAtEnd()) {
     cursor.Refuse(Refusal::EMPTY_DOCUMENT, cursor.GetPlace());
   }
-  // "<?xml-stylesheet" begins an instruction.
-  const std::string_view behind = source.substr(markLength).substr(0, DECLARATION_BEGIN.size() + 1);
-  if (cursor.IsAt(DECLARATION_BEGIN) && (behind.size() == DECLARATION_BEGIN.size() || IsOfClass(behind.back(), SPACE))) {
+  if (cursor.IsAt(DECLARATION_BEGIN) && !GoesOn(source.substr(markLength + DECLARATION_BEGIN.size()))) {
     ReadDeclaration(cursor);
   }
 }

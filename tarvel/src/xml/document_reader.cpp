@@ -185,12 +185,12 @@ void DocumentReader::ReadAttributes(const char *tag) {
 
 void DocumentReader::ReadAttribute(const char *tag, bool isAfterSpace) {
   const char *const begin = m_cursor.GetPlace();
+  if (!isAfterSpace && m_cursor.SkipNcName()) {
+    m_cursor.Refuse(Refusal::NO_SPACE_BEFORE_ATTRIBUTE, begin);
+  }
   const WrittenName name = m_cursor.ReadName(Refusal::ENDS_IN_START_TAG);
   if (name.text.empty()) {
     m_cursor.RefuseNext(Refusal::NOT_AN_ATTRIBUTE, Refusal::ENDS_IN_START_TAG);
-  }
-  if (!isAfterSpace) {
-    m_cursor.Refuse(Refusal::NO_SPACE_BEFORE_ATTRIBUTE, begin);
   }
   if (m_attributes.size() == MAX_ATTRIBUTES) {
     m_cursor.Refuse(Refusal::TOO_MANY_ATTRIBUTES, tag);
@@ -404,7 +404,7 @@ std::string_view DocumentReader::ReadTarget() {
   if (m_cursor.IsAt(':')) {
     m_cursor.Refuse(Refusal::COLON_IN_TARGET, m_cursor.GetPlace());
   }
-  if (!hasName) {
+  if (!hasName || m_cursor.IsAtEnd()) {
     m_cursor.RefuseNext(Refusal::NO_TARGET, Refusal::ENDS_IN_INSTRUCTION);
   }
   const std::string_view target = m_cursor.GetFrom(nameBegin);
