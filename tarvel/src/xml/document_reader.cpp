@@ -24,7 +24,6 @@ constexpr std::string_view CDATA_END = "]]>";
 constexpr std::string_view INSTRUCTION_BEGIN = "<?";
 constexpr std::string_view INSTRUCTION_END = "?>";
 
-
 class DocumentReader {
 public:
   DocumentReader(std::string_view source, XMLHandler &handler);

@@ -88,8 +88,7 @@ void NamespaceScope::CheckPair(const AttributeEvent &first, const AttributeEvent
   if (first.name == second.name) {
     m_cursor.Refuse(Refusal::ATTRIBUTE_TWICE, second.name.data(), second.name);
   }
-  if (first.prefixLength == 0 || second.prefixLength == 0 ||
-      first.GetLocalName() != second.GetLocalName()) {
+  if (first.prefixLength == 0 || second.prefixLength == 0 || first.GetLocalName() != second.GetLocalName()) {
     return;
   }
   const std::size_t found = FindNamespace(first.GetPrefix());

@@ -38,7 +38,8 @@ private:
     std::string_view prefix;
     std::string_view written; // the namespace name as the source has it, if nothing was replaced in it
     std::string replaced;     // the namespace name otherwise
-    std::size_t representative = UNKNOWN; // the first declaration in force of an equal namespace name, once it was sought
+    std::size_t representative =
+        UNKNOWN; // the first declaration in force of an equal namespace name, once it was sought
 
     std::string_view GetNamespace() const noexcept { return replaced.empty() ? written : replaced; }
   };

@@ -35,11 +35,11 @@ constexpr std::array<std::uint8_t, 256> MakeCharacterClasses() noexcept {
     const bool isLetter = (c >= 'a' && c <= 'z') || (c >= 'A' && c <= 'Z') || c == '_';
     const bool isInName = isLetter || (c >= '0' && c <= '9') || c == '-' || c == '.';
     const bool isAccepted = code >= 0x20 || isOneOf(c, "\t\r\n");
-    classes[code] = static_cast<std::uint8_t>(
-        (isOneOf(c, " \t\r\n") ? SPACE : 0) | (isLetter ? NAME_START : 0) | (isInName ? NAME : 0) |
-        (isAccepted && !isOneOf(c, "<&]\r") ? PLAIN_IN_TEXT : 0) |
-        (isAccepted && !isOneOf(c, "<&\"'\t\r\n") ? PLAIN_IN_VALUE : 0) |
-        (isAccepted && !isOneOf(c, "-]?\r") ? PLAIN_IN_MARKUP : 0));
+    classes[code] =
+        static_cast<std::uint8_t>((isOneOf(c, " \t\r\n") ? SPACE : 0) | (isLetter ? NAME_START : 0) |
+                                  (isInName ? NAME : 0) | (isAccepted && !isOneOf(c, "<&]\r") ? PLAIN_IN_TEXT : 0) |
+                                  (isAccepted && !isOneOf(c, "<&\"'\t\r\n") ? PLAIN_IN_VALUE : 0) |
+                                  (isAccepted && !isOneOf(c, "-]?\r") ? PLAIN_IN_MARKUP : 0));
   }
   return classes;
 }

@@ -77,10 +77,9 @@ TEST(LongValues, OfAReferenceAreCutInItsRefusal) {
 }
 
 TEST(LongValues, OfANameAreCutInAMessageOfTheParser) {
-  for (const std::string &xml :
-       {"<a>&" + LONG + ";</a>", "<a></" + LONG_NAME + ">", "<" + LONG_NAME + "></a>",
-        "<a " + LONG_NAME + "='' " + LONG_NAME + "=''/>", "<?xml version='" + LONG + "'?><a/>",
-        "<?xml version='1.0' encoding='" + LONG + "'?><a/>", "<a xmlns:b='" + LONG + " '/>"}) {
+  for (const std::string &xml : {"<a>&" + LONG + ";</a>", "<a></" + LONG_NAME + ">", "<" + LONG_NAME + "></a>",
+                                 "<a " + LONG_NAME + "='' " + LONG_NAME + "=''/>", "<?xml version='" + LONG + "'?><a/>",
+                                 "<?xml version='1.0' encoding='" + LONG + "'?><a/>", "<a xmlns:b='" + LONG + " '/>"}) {
     const Outcome outcome = TryToken(xml);
     EXPECT_EQ("XMLParseException", outcome.exceptionClass) << xml.substr(0, 40);
     EXPECT_LT(outcome.text.size(), LONGEST_MESSAGE) << xml.substr(0, 40);
