@@ -18,9 +18,11 @@
 namespace Attacks {
 namespace {
 
+using Tarvel::Xml::MAX_DOCUMENT_BYTES;
+using Tarvel::Xml::MAX_NAME_BYTES;
+using Tarvel::Xml::MAX_NODES;
+
 constexpr std::size_t MAX_HEAP_OCTETS = 160u * 1024 * 1024; // beside the text that the caller has
-constexpr std::size_t MAX_NODES = 1024u * 1024;             // attributes included
-constexpr std::size_t MAX_NAME_BYTES = 4096;
 
 std::string Repeated(const std::string &piece, std::size_t count) {
   std::string text;
@@ -42,12 +44,13 @@ void PrintTo(const LargeDocument &document, std::ostream *out) {
   *out << document.name;
 }
 
-/// As many elements as there may be, and at the end, which has `nodes` nodes and attributes, something long.
+/// As many elements as there may be, and at the end, which has `nodes` nodes and attributes, something long. A reference at
+/// the beginning has the reader make its buffer when the rest of the document is longest.
 std::string WithElements(const std::string &end, std::size_t nodes) {
-  return "<r>" + Repeated("<a/>", MAX_NODES - 1 - nodes) + end + "</r>";
+  return "<r>" + REFERENCE + Repeated("<a/>", MAX_NODES - 2 - nodes) + end + "</r>";
 }
 
-constexpr std::size_t LEFT_BESIDE_ELEMENTS = Tarvel::Xml::MAX_DOCUMENT_BYTES - 4 * MAX_NODES - 20;
+constexpr std::size_t LEFT_BESIDE_ELEMENTS = MAX_DOCUMENT_BYTES - 4 * MAX_NODES - 20;
 
 /// Decoded piece by piece, which makes a buffer grow.
 std::string DecodedInPieces() {
@@ -99,7 +102,7 @@ std::string WithDeclarations() {
 std::string WithNames() {
   const std::string nodes = Repeated("<a/>", MAX_NODES - 4000);
   std::string xml = "<r>" + nodes;
-  for (std::size_t number = 0; xml.size() + MAX_NAME_BYTES + 100 < Tarvel::Xml::MAX_DOCUMENT_BYTES; ++number) {
+  for (std::size_t number = 0; xml.size() + MAX_NAME_BYTES + 100 < MAX_DOCUMENT_BYTES; ++number) {
     const std::string end = std::to_string(number);
     xml += "<" + std::string(MAX_NAME_BYTES - end.size(), 'n') + end + "/>";
   }
@@ -108,8 +111,7 @@ std::string WithNames() {
 
 std::string WithPrefixes() {
   std::string xml = "<r>";
-  for (std::size_t number = 0; xml.size() + 40 < Tarvel::Xml::MAX_DOCUMENT_BYTES && number < MAX_NODES / 2 - 1;
-       ++number) {
+  for (std::size_t number = 0; xml.size() + 40 < MAX_DOCUMENT_BYTES && number < MAX_NODES / 2 - 1; ++number) {
     const std::string prefix = "p" + std::to_string(number);
     xml += "<" + prefix + ":a xmlns:" + prefix + "='u'/>";
   }
@@ -124,18 +126,18 @@ std::string WithInstructions() {
   return "<r>" + Repeated("<?p d?>", MAX_NODES - 2) + "</r>";
 }
 
-class HeapLimit : public testing::TestWithParam<LargeDocument> {};
+class LargestDocuments : public testing::TestWithParam<LargeDocument> {};
 
-TEST_P(HeapLimit, HoldsForAToken) {
+TEST_P(LargestDocuments, TakeABoundedPartOfTheHeapAsTokens) {
   const std::string xml = GetParam().make();
-  ASSERT_LE(xml.size(), Tarvel::Xml::MAX_DOCUMENT_BYTES);
+  ASSERT_LE(xml.size(), MAX_DOCUMENT_BYTES);
   const HeapCount heap;
   const Outcome outcome = TryToken(xml);
   EXPECT_LE(heap.GetPeak(), MAX_HEAP_OCTETS);
   EXPECT_EQ("ParseException", outcome.exceptionClass) << outcome.text.substr(0, 1000);
 }
 
-TEST_P(HeapLimit, HoldsForADocument) {
+TEST_P(LargestDocuments, TakeABoundedPartOfTheHeapToParse) {
   const std::string xml = GetParam().make();
   const HeapCount heap;
   const auto reader = Tarvel::CreateStringReader(xml);
@@ -145,8 +147,19 @@ TEST_P(HeapLimit, HoldsForADocument) {
   EXPECT_TRUE(document);
 }
 
+TEST(LargestDocument, OfMoreNodesIsRefusedWithinThatPartOfTheHeap) {
+  const std::string piece = "<a/>x";
+  const std::string xml = "<r>" + Repeated(piece, MAX_DOCUMENT_BYTES / piece.size() - 2) + "</r>";
+  const HeapCount heap;
+  const Outcome outcome = TryToken(xml);
+  EXPECT_LE(heap.GetPeak(), MAX_HEAP_OCTETS);
+  EXPECT_EQ((Outcome{"XMLParseException",
+                     "the document has more than 1048576 nodes and attributes at line 1, column 2621443"}),
+            outcome);
+}
+
 INSTANTIATE_TEST_SUITE_P(
-    Of, HeapLimit,
+    With, LargestDocuments,
     testing::Values(LargeDocument{"OneText", WithText}, LargeDocument{"ReferencesInText", WithReferencesInText},
                     LargeDocument{"ReferencesInAttribute", WithReferencesInAttribute},
                     LargeDocument{"TextsBetweenElements", WithTexts}, LargeDocument{"OneAttribute", WithAttribute},
