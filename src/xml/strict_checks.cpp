@@ -1,8 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "xml/strict_checks.h"
 
-#include "xml/qualified_name.h"
-
 #include <ssoclient/exceptions.h>
 #include <tarvel/core/exception.h>
 #include <tarvel/core/message_formatter.h>
@@ -18,7 +16,6 @@ namespace {
 
 using Tarvel::Xml::Attribute;
 using Tarvel::Xml::ElementNode;
-using Tarvel::Xml::QName;
 
 constexpr std::string_view DEFAULT_DECLARATION = "xmlns";
 constexpr std::string_view PREFIX_DECLARATION = "xmlns:";
@@ -62,13 +59,13 @@ bool HasAttributeWritten(const ElementNode &element, std::string_view name) {
 
 const ElementNode &RequireElementQName(const ElementNode *element, std::string_view localName,
                                        std::string_view namespaceUri) {
+  if (ElementQNameIs(element, localName, namespaceUri)) {
+    return *element;
+  }
   if (!element || element->GetLocalName() != localName) {
     Refuse("Expected element '%1' not found.", localName);
   }
-  if (!ElementQNameIs(element, localName, namespaceUri)) {
-    Refuse("Element '%1' has unexpected namespace", element->GetName());
-  }
-  return *element;
+  Refuse("Element '%1' has unexpected namespace", element->GetName());
 }
 
 void RequireEmptyElement(NodeFilterIterator iterator) {
@@ -103,22 +100,19 @@ void RequireElementAttributesNames(const ElementNode &element, std::initializer_
   }
 }
 
-void RequireElementAttributesQNames(const ElementNode &element, const std::vector<QName> &required,
-                                    const std::vector<QName> &optional) {
-  std::vector<QName> found;
+void RequireElementAttributesQNames(const ElementNode &element, std::initializer_list<QNameView> required,
+                                    std::initializer_list<QNameView> optional) {
   for (const Attribute *attribute = element.GetFirstAttribute(); attribute; attribute = attribute->GetNext()) {
     if (IsDeclaration(attribute->GetName())) {
       continue;
     }
-    QName name;
-    ResolveQName(element, attribute->GetName(), std::string_view(), name);
+    const QNameView name = ResolveQName(element, attribute->GetName(), std::string_view());
     if (!Contains(required, name) && !Contains(optional, name)) {
       Refuse("Unexpected attribute '%1' on element '%2'", name.ToString(), element.GetName());
     }
-    found.push_back(std::move(name));
   }
-  for (const QName &name : required) {
-    if (!Contains(found, name)) {
+  for (const QNameView &name : required) {
+    if (!element.FindAttribute(name.namespaceUri, name.localName)) {
       RefuseMissingAttribute(element, name.ToString());
     }
   }
