@@ -31,8 +31,7 @@ template <typename... Args>
   Refuse("Node '%1 is missing required attribute '%2'", element.GetName(), name);
 }
 
-std::string_view NameAt(const NodeFilterIterator &iterator) {
-  const ElementNode *const element = IteratorToElement(iterator);
+std::string_view NameOf(const ElementNode *element) {
   return element ? element->GetName() : std::string_view();
 }
 
@@ -70,7 +69,7 @@ const ElementNode &RequireElementQName(const ElementNode *element, std::string_v
 
 void RequireEmptyElement(NodeFilterIterator iterator) {
   if (iterator.GetChild().node) {
-    Refuse("Element '%1' must be empty", NameAt(iterator));
+    Refuse("Element '%1' must be empty", NameOf(IteratorToElement(iterator)));
   }
 }
 
@@ -119,10 +118,10 @@ void RequireElementAttributesQNames(const ElementNode &element, std::initializer
 }
 
 void RequireTextualContent(NodeFilterIterator iterator, std::string &text) {
-  NodeFilterIterator child = iterator.GetChild();
-  const Tarvel::Xml::TextNode *const textNode = Tarvel::Xml::AsText(child.node);
-  if (!textNode || child.MoveToSibling().node) {
-    Refuse("Element '%1' must only have textual content (but has extra children or is empty).", NameAt(iterator));
+  const ElementNode *const element = IteratorToElement(iterator);
+  const Tarvel::Xml::TextNode *const textNode = Tarvel::Xml::AsText(iterator.MoveToChild().node);
+  if (!textNode || iterator.MoveToSibling().node) {
+    Refuse("Element '%1' must only have textual content (but has extra children or is empty).", NameOf(element));
   }
   text = textNode->GetValue();
 }
