@@ -51,7 +51,9 @@ SamlTokenImpl::SamlTokenImpl(const ElementNode &element, const KeyInfoResolver &
 
 void SamlTokenImpl::InitializeFromDom(const ElementNode *element, const KeyInfoResolver &resolver,
                                       std::int64_t clockToleranceSec) {
-  NodeFilterIterator iterator(element, std::make_shared<SkipWsAndCommentsFilter>());
+  // The filter outlives all cursors. So it is shared without a count, which would cost two atomic operations a cursor.
+  const SkipWsAndCommentsFilter filter;
+  NodeFilterIterator iterator(element, std::shared_ptr<const NodeFilter>(std::shared_ptr<void>(), &filter));
   SamlAssertionType assertion;
   ParseSamlAssertionElement(iterator, assertion);
   CheckTokenProperties(assertion, clockToleranceSec);
