@@ -96,6 +96,8 @@ using ParserHandle = std::unique_ptr<xmlParserCtxt, decltype(&xmlFreeParserCtxt)
 
 ParserHandle MakeParser() {
   xmlInitParser();
+  // What belongs to no parser, such as that a text cannot be recoded, would be printed.
+  xmlSetStructuredErrorFunc(nullptr, [](void *, xmlErrorPtr) {});
   ParserHandle parser(xmlNewParserCtxt(), &xmlFreeParserCtxt);
   xmlSAXHandler table{};
   table.initialized = XML_SAX2_MAGIC;

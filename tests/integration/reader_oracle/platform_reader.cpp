@@ -2,6 +2,8 @@
 
 #include "readers.h"
 
+#include "xml/document_reader.h"
+
 #include <tarvel/core/ref.h>
 #include <tarvel/io/reader.h>
 #include <tarvel/xml/parser.h>
@@ -68,6 +70,13 @@ private:
   Reading &m_reading;
 };
 
+void TakeRefusal(const Tarvel::Xml::XMLParseException &exception, Reading &reading) {
+  reading.line = exception.GetLine();
+  reading.column = exception.GetColumn();
+  const std::string message = exception.what();
+  reading.message = message.substr(0, message.rfind(" at line "));
+}
+
 } // namespace
 
 Reading ReadWithPlatform(std::string_view document) {
@@ -76,10 +85,19 @@ Reading ReadWithPlatform(std::string_view document) {
     const auto source = Tarvel::CreateStringReader(std::string(document));
     Tarvel::Xml::CreateXMLParser(Tarvel::MakeRef<Recorder>(reading))->Parse(*source);
   } catch (const Tarvel::Xml::XMLParseException &exception) {
-    reading.line = exception.GetLine();
-    reading.column = exception.GetColumn();
-    const std::string message = exception.what();
-    reading.message = message.substr(0, message.rfind(" at line "));
+    TakeRefusal(exception, reading);
+  }
+  return reading;
+}
+
+Reading ReadInPlace(std::string_view document) {
+  Reading reading;
+  const Ref<Recorder> recorder = Tarvel::MakeRef<Recorder>(reading);
+  try {
+    Tarvel::Xml::ReadDocument(document, *recorder);
+    reading.isAccepted = true;
+  } catch (const Tarvel::Xml::XMLParseException &exception) {
+    TakeRefusal(exception, reading);
   }
   return reading;
 }

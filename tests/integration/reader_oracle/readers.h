@@ -12,6 +12,9 @@ namespace Testing {
 
 Reading ReadWithPlatform(std::string_view document);
 
+/// The platform's reader without the copy of the document that the parser above it makes.
+Reading ReadInPlace(std::string_view document);
+
 /// libxml2's SAX2 interface with namespaces. Refused is what is not well-formed, and every error of namespaces but an unbound
 /// prefix. The declared encoding does not count.
 Reading ReadWithLibxml2(std::string_view document);

@@ -32,6 +32,18 @@ void EventText::Add(char kind, std::string_view text) {
   m_isInText = false;
 }
 
+std::size_t OffsetOf(std::string_view document, std::uint32_t line, std::uint32_t column) {
+  std::size_t begin = document.substr(0, 3) == "\xEF\xBB\xBF" ? 3 : 0;
+  for (std::uint32_t counted = 1; counted < line; ++counted) {
+    const std::size_t lineBreak = document.find('\n', begin);
+    if (lineBreak == std::string_view::npos) {
+      return document.size() + 1;
+    }
+    begin = lineBreak + 1;
+  }
+  return begin + column - 1;
+}
+
 bool IsDeclaration(std::string_view name) {
   return name.substr(0, 5) == "xmlns" && (name.size() == 5 || name[5] == ':');
 }

@@ -46,6 +46,10 @@ struct Reading {
   static constexpr std::size_t NO_OFFSET = static_cast<std::size_t>(-1);
 };
 
+/// The offset in `document` of line and column as we count them: lines end with LF, columns are octets from 1, and a byte
+/// order mark has none. More than the document's size when there is no such line.
+std::size_t OffsetOf(std::string_view document, std::uint32_t line, std::uint32_t column);
+
 /// Whether a name as written is "xmlns" or begins with "xmlns:".
 bool IsDeclaration(std::string_view name);
 
