@@ -41,10 +41,7 @@ public:
 
   void build(ElementRef &out) const override {
     m_element.build(out);
-    Tarvel::Ref<Tarvel::Xml::TextNode> text;
-    Tarvel::Xml::CreateTextNode(text);
-    text->SetValue(m_text);
-    out->AppendChild(text.get());
+    out->AppendText(m_text);
   }
 
 private:

@@ -6,7 +6,7 @@
 
 #include "crypto/openssl_handles.h"
 #include "crypto/public_key.h"
-#include "crypto/verify_contexts.h"
+#include "crypto/key_contexts.h"
 
 #include <tarvel/crypto/certificate.h>
 
@@ -29,7 +29,7 @@ public:
   KeyKind GetKeyKind() const noexcept { return m_keyKind; }
   unsigned GetKeyBits() const noexcept { return m_keyBits; }
   bool HasSoundExponent() const noexcept { return m_hasSoundExponent; }
-  VerifyContexts &GetVerifyContexts() const noexcept { return m_verifyContexts; }
+  KeyContexts &GetVerifyContexts() const noexcept { return m_verifyContexts; }
 
   /// Owned by the certificate. The key is null when OpenSSL does not know its algorithm.
   X509 *GetNative() const noexcept { return m_native.get(); }
@@ -46,7 +46,7 @@ private:
   bool m_hasSoundExponent = false;
   std::int64_t m_notBefore = 0; // microseconds since the epoch
   std::int64_t m_notAfter = 0;
-  mutable VerifyContexts m_verifyContexts;
+  mutable KeyContexts m_verifyContexts;
 };
 
 /// `certificate` as what it is.

@@ -4,6 +4,7 @@
 
 #pragma once
 
+#include "crypto/key_contexts.h"
 #include "crypto/openssl_handles.h"
 
 #include <tarvel/crypto/private_key.h>
@@ -18,6 +19,7 @@ public:
 
   std::string GetAlgorithm() const override { return m_algorithm; }
   unsigned GetBits() const override { return m_bits; }
+  KeyContexts &GetSignContexts() const noexcept { return m_signContexts; }
 
   /// Owned by the key; OpenSSL counts its own references to it.
   EVP_PKEY *GetNative() const noexcept { return m_native.get(); }
@@ -28,6 +30,7 @@ private:
   const char *m_algorithm = nullptr;
   unsigned m_bits = 0;
   KeyHandle m_native; // OpenSSL wipes the numbers when it frees them
+  mutable KeyContexts m_signContexts;
 };
 
 /// `key` as what it is.

@@ -71,6 +71,15 @@ KeyContextHandle NewVerifyContext(EVP_PKEY *sharedKey, SignatureScheme scheme, D
   return context;
 }
 
+KeyContextHandle NewSignContext(EVP_PKEY *key, SignatureScheme scheme, DigestAlgorithm algorithm) {
+  const OpenSslErrorScope errors;
+  KeyContextHandle context(EVP_PKEY_CTX_new_from_pkey(GetLibraryContext(), key, nullptr));
+  if (!context || EVP_PKEY_sign_init(context.get()) <= 0 || !SetScheme(context.get(), scheme, algorithm)) {
+    errors.Throw("Failed to set up a signature");
+  }
+  return context;
+}
+
 BignumHandle ReadNumber(const std::uint8_t *bytes, std::size_t length) {
   return BignumHandle(BN_bin2bn(bytes, static_cast<int>(length), nullptr));
 }
@@ -143,7 +152,7 @@ bool VerifyDigest(const Certificate &certificate, SignatureScheme scheme, Digest
   }
   const OpenSslUse use;
   use.Require();
-  VerifyContexts &contexts = impl.GetVerifyContexts();
+  KeyContexts &contexts = impl.GetVerifyContexts();
   KeyContextHandle context = contexts.Take(scheme, algorithm);
   if (!context) {
     context = NewVerifyContext(impl.GetNativeKey(), scheme, algorithm);
@@ -167,17 +176,21 @@ std::vector<std::uint8_t> SignDigest(const PrivateKey &key, SignatureScheme sche
   if (key.GetAlgorithm() != (IsRsaScheme(scheme) ? "RSA" : "EC")) {
     throw CryptoException("A key of algorithm " + key.GetAlgorithm() + " cannot make a signature of this scheme");
   }
-  EVP_PKEY *const native = AsImpl(key).GetNative();
-  const KeyContextHandle context(EVP_PKEY_CTX_new_from_pkey(GetLibraryContext(), native, nullptr));
+  const PrivateKeyImpl &impl = AsImpl(key);
+  KeyContexts &contexts = impl.GetSignContexts();
+  KeyContextHandle context = contexts.Take(scheme, algorithm);
+  if (!context) {
+    context = NewSignContext(impl.GetNative(), scheme, algorithm);
+  }
   std::size_t length = 0;
-  if (!context || EVP_PKEY_sign_init(context.get()) <= 0 || !SetScheme(context.get(), scheme, algorithm) ||
-      EVP_PKEY_sign(context.get(), nullptr, &length, digest, DigestBytes(algorithm)) <= 0) {
+  if (EVP_PKEY_sign(context.get(), nullptr, &length, digest, DigestBytes(algorithm)) <= 0) {
     errors.Throw("Failed to set up a signature");
   }
   std::vector<std::uint8_t> value(length);
   if (EVP_PKEY_sign(context.get(), value.data(), &length, digest, DigestBytes(algorithm)) <= 0) {
     errors.Throw("Failed to sign");
   }
+  contexts.Put(scheme, algorithm, std::move(context));
   value.resize(length);
   return IsRsaScheme(scheme) ? value : DecodeEcdsaValue(value, BytesOf(key.GetBits()));
 }

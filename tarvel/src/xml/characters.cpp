@@ -59,6 +59,20 @@ std::size_t FindNonAscii(std::string_view text) noexcept {
   return std::string_view::npos;
 }
 
+/// The length of a beginning of `text` that holds nothing but ASCII from the blank on, found by eight bytes at a time.
+std::size_t CountPlainAscii(std::string_view text) noexcept {
+  constexpr std::uint64_t HIGH_BITS = 0x8080808080808080;
+  constexpr std::uint64_t BLANKS = 0x2020202020202020;
+  std::size_t offset = 0;
+  for (std::uint64_t word = 0; text.size() - offset >= sizeof word; offset += sizeof word) {
+    std::memcpy(&word, text.data() + offset, sizeof word);
+    if ((word | (word - BLANKS)) & HIGH_BITS) { // the subtraction borrows from the high bit of a control character
+      break;
+    }
+  }
+  return offset;
+}
+
 } // namespace
 
 bool IsNameStart(std::uint32_t character) noexcept {
@@ -155,7 +169,7 @@ std::size_t FindInvalidUtf8(std::string_view text) noexcept {
 }
 
 std::string DescribeForbiddenCharacter(std::string_view what, std::string_view text) {
-  std::size_t offset = 0;
+  std::size_t offset = CountPlainAscii(text);
   while (offset < text.size()) {
     const std::size_t begin = offset;
     const std::uint32_t character = ReadCharacter(text, offset);

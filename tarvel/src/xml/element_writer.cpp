@@ -9,7 +9,8 @@
 #include <array>
 #include <cstddef>
 #include <cstdint>
-#include <string>
+#include <cstring>
+#include <memory>
 #include <string_view>
 
 namespace Tarvel {
@@ -20,7 +21,22 @@ namespace {
 constexpr std::size_t FLUSH_BYTES = 8 * 1024;
 constexpr unsigned char FIRST_BEYOND_ASCII = 0x80;
 
-/// A set of characters, asked for each byte that is written.
+constexpr std::uint64_t EACH_BYTE = 0x0101010101010101;
+constexpr std::size_t WORD_BYTES = sizeof(std::uint64_t);
+
+/// Whether none of the eight bytes is written as a reference, wherever they are: all are ASCII from the blank on, and none is
+/// one of `&<>"`. The subtractions borrow from a byte's high bit, or from the byte after one that is special already.
+bool IsPlainWord(const char *bytes) noexcept {
+  std::uint64_t word = 0;
+  std::memcpy(&word, bytes, WORD_BYTES);
+  std::uint64_t special = word | (word - EACH_BYTE * ' ');
+  for (const char character : {'&', '<', '>', '"'}) {
+    special |= (word ^ EACH_BYTE * static_cast<std::uint64_t>(character)) - EACH_BYTE;
+  }
+  return (special & EACH_BYTE * FIRST_BEYOND_ASCII) == 0;
+}
+
+/// A set of characters, each of which is written as a reference.
 class CharacterSet {
 public:
   /// @param form with references, every byte of a character beyond ASCII is in the set as well.
@@ -36,6 +52,9 @@ public:
   /// The offset of the first character of `text` that is in the set, or the text's size.
   std::size_t FindIn(std::string_view text) const noexcept {
     std::size_t offset = 0;
+    while (text.size() - offset >= WORD_BYTES && IsPlainWord(text.data() + offset)) {
+      offset += WORD_BYTES;
+    }
     while (offset < text.size() && !m_contains[static_cast<unsigned char>(text[offset])]) {
       ++offset;
     }
@@ -64,26 +83,24 @@ constexpr Specials SpecialsOf(CharacterForm form) {
 constexpr Specials SPECIALS_OF_UTF8 = SpecialsOf(CharacterForm::UTF8);
 constexpr Specials SPECIALS_OF_REFERENCES = SpecialsOf(CharacterForm::REFERENCES);
 
-/// Gathers the pieces of markup, so that the writer is called for larger ones. The buffer never grows, so that no copy of
-/// a text that may be secret is left behind in the heap.
+/// Gathers the pieces of markup, so that the writer is called for larger ones. What was gathered is wiped: it may be secret.
 class MarkupOutput {
 public:
-  explicit MarkupOutput(Writer &writer) : m_writer(writer) { m_buffer.reserve(FLUSH_BYTES); }
+  explicit MarkupOutput(Writer &writer) : m_writer(writer) {}
   MarkupOutput(const MarkupOutput &) = delete;
   MarkupOutput &operator=(const MarkupOutput &) = delete;
-  ~MarkupOutput() { SecureWipe(m_buffer); }
+  ~MarkupOutput() { SecureWipe(m_buffer.get(), FLUSH_BYTES); }
 
   MarkupOutput &operator<<(std::string_view markup) {
-    if (markup.size() > FLUSH_BYTES - m_buffer.size()) {
-      Flush();
-    }
-    if (markup.size() > FLUSH_BYTES) {
-      m_writer.Write(markup);
+    if (markup.size() > FLUSH_BYTES - m_used) {
+      WritePastBuffer(markup);
       return *this;
     }
-    m_buffer.append(markup);
+    Put(markup);
     return *this;
   }
+
+  MarkupOutput &operator<<(char markup) { return *this << std::string_view(&markup, 1); }
 
   /// Writes `text`, each of the characters in `special` as the reference that stands for it.
   void WriteEscaped(std::string_view text, const CharacterSet &special) {
@@ -105,11 +122,25 @@ public:
   }
 
   void Flush() {
-    m_writer.Write(m_buffer);
-    m_buffer.clear();
+    m_writer.Write(std::string_view(m_buffer.get(), m_used));
+    m_used = 0;
   }
 
 private:
+  void Put(std::string_view markup) {
+    markup.copy(m_buffer.get() + m_used, markup.size());
+    m_used += markup.size();
+  }
+
+  void WritePastBuffer(std::string_view markup) {
+    Flush();
+    if (markup.size() > FLUSH_BYTES) {
+      m_writer.Write(markup);
+    } else {
+      Put(markup);
+    }
+  }
+
   /// The texts of a tree are UTF-8: `character` is one.
   void WriteNumber(std::uint32_t character) {
     constexpr std::string_view DIGITS = "0123456789ABCDEF";
@@ -142,17 +173,18 @@ private:
   }
 
   Writer &m_writer;
-  std::string m_buffer;
+  const std::unique_ptr<char[]> m_buffer = std::make_unique_for_overwrite<char[]>(FLUSH_BYTES);
+  std::size_t m_used = 0;
 };
 
 void WriteStartTag(const ElementNode &element, const Specials &specials, MarkupOutput &output) {
-  output << "<" << element.GetName();
+  output << '<' << element.GetName();
   for (const Attribute *attribute = element.GetFirstAttribute(); attribute; attribute = attribute->GetNext()) {
-    output << " " << attribute->GetName() << "=\"";
+    output << ' ' << attribute->GetName() << "=\"";
     output.WriteEscaped(attribute->GetValue(), specials.inAttributes);
-    output << "\"";
+    output << '"';
   }
-  output << ">";
+  output << '>';
 }
 
 /// Writes the node, or only the start tag of an element.
@@ -180,7 +212,7 @@ void WriteBegin(const Node &node, const Specials &specials, MarkupOutput &output
 
 void WriteEnd(const Node &node, MarkupOutput &output) {
   if (const ElementNode *const element = AsElement(&node)) {
-    output << "</" << element->GetName() << ">";
+    output << "</" << element->GetName() << '>';
   }
 }
 

@@ -10,6 +10,7 @@
 #include <tarvel/core/string_util.h>
 
 #include <string>
+#include <utility>
 
 namespace Tarvel {
 namespace Xml {
@@ -32,6 +33,13 @@ void RequireNcName(std::string_view what, std::string_view name) {
     throw InvalidArgumentException(std::string(what) + " '" + StringUtil::Shorten(name) +
                                    "' is not an XML name without a colon");
   }
+}
+
+void RequireElementName(std::string_view prefix, std::string_view localName) {
+  if (!prefix.empty()) {
+    RequireNcName("the prefix", prefix);
+  }
+  RequireNcName("the local name", localName);
 }
 
 /// The prefix that a namespace declaration binds; empty for the default namespace.
@@ -194,6 +202,21 @@ void ElementNode::DefineAttribute(std::string_view qualifiedName, std::string_vi
   AppendAttribute(name, hasPrefix ? colon : 0, m_arena->Copy(value));
 }
 
+ElementNode *ElementNode::AppendElement(std::string_view prefix, std::string_view localName) {
+  RequireElementName(prefix, localName);
+  ElementNode *const child = m_arena->New<ElementNode>(m_arena);
+  child->SetName(m_arena->CopyQualifiedName(prefix, localName));
+  AppendNode(child);
+  return child;
+}
+
+void ElementNode::AppendText(std::string_view value) {
+  m_arena->WipeAfterUse();
+  TextNode *const text = m_arena->New<TextNode>(m_arena);
+  text->SetValue(value);
+  AppendNode(text);
+}
+
 void ElementNode::SetName(std::string_view name) noexcept {
   const std::size_t colon = name.find(':');
   m_name = name;
@@ -237,15 +260,11 @@ void ElementNode::AppendChild(Node *child) {
 }
 
 void CreateElementNode(std::string_view prefix, std::string_view localName, Ref<ElementNode> &out) {
-  if (!prefix.empty()) {
-    RequireNcName("the prefix", prefix);
-  }
-  RequireNcName("the local name", localName);
+  RequireElementName(prefix, localName);
   NodeArena *const arena = NodeArena::Create(ELEMENT_ARENA_BYTES);
-  const Ref<ElementNode> element(arena->New<ElementNode>(arena));
-  element->SetName(
-      arena->Copy(prefix.empty() ? std::string(localName) : std::string(prefix) + ':' + std::string(localName)));
-  out = element;
+  Ref<ElementNode> element(arena->New<ElementNode>(arena));
+  element->SetName(arena->CopyQualifiedName(prefix, localName));
+  out = std::move(element);
 }
 
 void CreateTextNode(Ref<TextNode> &out) {

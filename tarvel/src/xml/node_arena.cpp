@@ -91,18 +91,31 @@ std::string_view NodeArena::Copy(std::string_view text) {
   if (text.empty()) {
     return std::string_view();
   }
-  if (text.size() >= LARGEST_BLOCK_BYTES / 4) { // a block of its own, so that the rest of the current one is not lost
-    char *const own = AllocateBlock(text.size());
-    std::memcpy(own, text.data(), text.size());
-    return std::string_view(own, text.size());
-  }
-  if (static_cast<std::size_t>(m_end - m_free) < text.size()) {
-    AddBlock(text.size());
-  }
-  char *const copy = m_free;
+  char *const copy = AllocateText(text.size());
   std::memcpy(copy, text.data(), text.size());
-  m_free += text.size();
   return std::string_view(copy, text.size());
+}
+
+std::string_view NodeArena::CopyQualifiedName(std::string_view prefix, std::string_view localName) {
+  if (prefix.empty()) {
+    return Copy(localName);
+  }
+  const std::size_t size = prefix.size() + 1 + localName.size();
+  char *const name = AllocateText(size);
+  std::memcpy(name, prefix.data(), prefix.size());
+  name[prefix.size()] = ':';
+  std::memcpy(name + prefix.size() + 1, localName.data(), localName.size());
+  return std::string_view(name, size);
+}
+
+char *NodeArena::AllocateText(std::size_t size) {
+  if (size >= LARGEST_BLOCK_BYTES / 4) { // a block of its own, so that the rest of the current one is not lost
+    return AllocateBlock(size);
+  }
+  if (static_cast<std::size_t>(m_end - m_free) < size) {
+    AddBlock(size);
+  }
+  return std::exchange(m_free, m_free + size);
 }
 
 void NodeArena::AddBlock(std::size_t size) {

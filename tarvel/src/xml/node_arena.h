@@ -49,6 +49,12 @@ public:
   /// A copy of `text` in this arena's memory.
   std::string_view Copy(std::string_view text);
 
+  /// A copy of the name as written: the local name, after prefix and colon where there is a prefix.
+  std::string_view CopyQualifiedName(std::string_view prefix, std::string_view localName);
+
+  /// From now on the memory is overwritten before it is freed.
+  void WipeAfterUse() noexcept { m_afterUse = AfterUse::WIPE_AND_FREE; }
+
   /// Keeps `object`, which views of this arena's nodes point into, for as long as the arena lives.
   void Keep(const Ref<Object> &object) { m_kept = object; }
 
@@ -69,6 +75,7 @@ private:
   ~NodeArena();
 
   void *Allocate(std::size_t size);
+  char *AllocateText(std::size_t size);
   void AddBlock(std::size_t size);
   char *AllocateBlock(std::size_t size);
   void FreeAll() noexcept;

@@ -159,6 +159,21 @@ TEST_P(FreedMemory, HoldsNoPasswordOfARequestThatIsGone) {
   EXPECT_EQ(watch.Found(), 0);
 }
 
+// The whole of it fits into a buffer that later parts of a longer request would overwrite.
+TEST_P(FreedMemory, HoldsNoPasswordOfAShortRequestThatIsGone) {
+  const RequestBuilderImpl builder(boost::none);
+  const std::string password = GetParam();
+  TokenSpec spec;
+  spec.tokenLifetimeSec = 600;
+  const Watch watch(GetParam());
+  {
+    Request request;
+    builder.BuildUserPassTokenRequest("alice", password, spec, request);
+    ASSERT_NE(request.body.find(password), std::string::npos);
+  }
+  EXPECT_EQ(watch.Found(), 0);
+}
+
 TEST_P(FreedMemory, HoldsNoPasswordOfARequestThatCannotBeBuilt) {
   const RequestBuilderImpl builder(boost::none);
   const std::string password = GetParam();

@@ -209,6 +209,34 @@ TEST(SignDigest, RefusesAKeyThatDoesNotFitTheScheme) {
                         "A key of algorithm RSA cannot make a signature of this scheme");
 }
 
+TEST(SignDigest, SignsByTwoDigestsOnManyThreadsWithOneKey) {
+  constexpr int THREADS = 8;
+  constexpr int ROUNDS = 20;
+  const auto key = FixtureKey("rsa2048");
+  const auto isSignedRight = [&](DigestAlgorithm algorithm, const DigestValue &digest, const std::string &expected) {
+    const std::vector<std::uint8_t> value = SignDigest(*key, PKCS1, algorithm, digest.data());
+    return std::string(value.begin(), value.end()) == expected;
+  };
+  const DigestValue shortDigest = DigestOf(SHA256, ReadFixture("message.txt"));
+  const DigestValue longDigest = DigestOf(SHA512, ReadFixture("message.txt"));
+  const std::string shortExpected = ReadFixture("rsa2048-pkcs1-sha256.sig");
+  const std::string longExpected = ReadFixture("rsa2048-pkcs1-sha512.sig");
+  std::atomic<int> wrongValues{0};
+  std::vector<std::thread> threads;
+  for (int i = 0; i < THREADS; ++i) {
+    threads.emplace_back([&] {
+      for (int round = 0; round < ROUNDS; ++round) {
+        wrongValues += isSignedRight(SHA256, shortDigest, shortExpected) ? 0 : 1;
+        wrongValues += isSignedRight(SHA512, longDigest, longExpected) ? 0 : 1;
+      }
+    });
+  }
+  for (std::thread &thread : threads) {
+    thread.join();
+  }
+  EXPECT_EQ(wrongValues, 0);
+}
+
 struct KindOfKey {
   const char *certificate;
   KeyKind kind;

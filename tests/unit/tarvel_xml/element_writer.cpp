@@ -9,6 +9,7 @@
 
 #include <filesystem>
 #include <string>
+#include <string_view>
 
 namespace Tarvel {
 namespace Xml {
@@ -55,6 +56,15 @@ TEST(WriteTo, WritesMoreThanItsBufferHolds) {
   EXPECT_TRUE(WriteAgain(text) == text);
 }
 
+TEST(WriteTo, WritesPiecesOfEveryLengthAroundThatOfItsBuffer) {
+  for (const std::size_t around : {8192U, 16384U}) {
+    for (std::size_t length = around - 20; length <= around + 20; ++length) {
+      const std::string text = "<a><b>" + std::string(length, 'x') + "</b><c>" + std::string(10'000, 'y') + "</c></a>";
+      EXPECT_TRUE(WriteAgain(text) == text) << length;
+    }
+  }
+}
+
 std::string WriteInAscii(const ElementNode &element) {
   const Ref<StringWriter> writer = CreateStringWriter();
   element.WriteTo(*writer, CharacterForm::REFERENCES);
@@ -88,6 +98,32 @@ TEST(WriteTo, WritesMoreReferencesThanItsBufferHolds) {
   }
   const auto document = ParseDocument("<a>" + text + "</a>");
   EXPECT_TRUE(WriteInAscii(*document->GetDocumentElement()) == "<a>" + references + "</a>");
+}
+
+TEST(WriteTo, WritesAReferenceWhereverInATextItsCharacterIs) {
+  struct Case {
+    std::string_view character;
+    std::string_view inText;
+    std::string_view inAttributes;
+  };
+  constexpr Case CASES[] = {{"&", "&amp;", "&amp;"}, {"<", "&lt;", "&lt;"},    {">", "&gt;", ">"},
+                            {"\"", "\"", "&quot;"},  {"\r", "&#xD;", "&#xD;"}, {"\t", "\t", "&#x9;"},
+                            {"\n", "\n", "&#xA;"},   {"\x7F", "\x7F", "\x7F"}, {"\xC3\xBC", "&#xFC;", "&#xFC;"}};
+  for (const Case &tried : CASES) {
+    for (std::size_t before = 0; before < 20; ++before) {
+      const std::string begin(before, 'x');
+      const std::string end(20 - before, '!');
+      Ref<ElementNode> element;
+      CreateElementNode("", "a", element);
+      Ref<TextNode> text;
+      CreateTextNode(text);
+      element->DefineAttribute("x", begin + std::string(tried.character) + end);
+      text->SetValue(begin + std::string(tried.character) + end);
+      element->AppendChild(text.get());
+      EXPECT_EQ(WriteInAscii(*element), "<a x=\"" + begin + std::string(tried.inAttributes) + end + "\">" + begin +
+                                            std::string(tried.inText) + end + "</a>");
+    }
+  }
 }
 
 const char *const TEXTS[] = {"",

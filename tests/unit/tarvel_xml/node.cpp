@@ -99,6 +99,19 @@ TEST(CreateTextNode, MakesAnEmptyTextThatTakesValues) {
   }
 }
 
+TEST(SetValue, NamesTheByteOfAForbiddenCharacterWhereverItIs) {
+  Ref<TextNode> text;
+  CreateTextNode(text);
+  for (std::size_t before = 0; before < 20; ++before) {
+    const std::string byte = std::to_string(before + 1);
+    EXPECT_THROWS_MESSAGE(
+        text->SetValue(std::string(before, ' ') + "\x1F" + std::string(20 - before, '\x7F')), InvalidArgumentException,
+        "Invalid argument : the text holds the character U+001F at byte " + byte + ", which XML 1.0 cannot carry");
+    EXPECT_THROWS_MESSAGE(text->SetValue(std::string(before, '!') + "\x80" + std::string(20 - before, 'x')),
+                          InvalidArgumentException, "Invalid argument : the text is not UTF-8 at byte " + byte);
+  }
+}
+
 struct Forbidden {
   std::string value;
   std::string message; // behind what names the text
@@ -285,6 +298,53 @@ TEST(AppendChild, AppendsElementsAndTextInOrder) {
   EXPECT_EQ(WriteElement(*a), "<a><b></b>one<c></c></a>");
   EXPECT_EQ(a->FindChildElement("c")->GetParent(), a.get());
   EXPECT_EQ(a->FindChildElement("c")->GetRoot(), a.get());
+}
+
+TEST(AppendElement, MakesTheLastChild) {
+  const Ref<ElementNode> a = MakeElement("a");
+  a->AppendChild(MakeElement("b").get());
+  ElementNode *const c = a->AppendElement("p", "c");
+  EXPECT_EQ(c->GetName(), "p:c");
+  EXPECT_EQ(c->GetPrefix(), "p");
+  EXPECT_EQ(c->GetParent(), a.get());
+  c->DefineAttribute("x", "1");
+  c->AppendElement("", std::string(3000, 'd'))->AppendText("text");
+  EXPECT_EQ(WriteElement(*a),
+            "<a><b></b><p:c x=\"1\"><" + std::string(3000, 'd') + ">text</" + std::string(3000, 'd') + "></p:c></a>");
+}
+
+TEST(AppendElement, RefusesWhatIsNoNameAndKeepsTheElement) {
+  const Ref<ElementNode> a = MakeElement("a");
+  EXPECT_THROWS_MESSAGE(a->AppendElement("", "b:c"), InvalidArgumentException,
+                        "Invalid argument : the local name 'b:c' is not an XML name without a colon");
+  EXPECT_THROWS_MESSAGE(a->AppendElement("1", "b"), InvalidArgumentException,
+                        "Invalid argument : the prefix '1' is not an XML name without a colon");
+  EXPECT_EQ(a->GetFirstChild(), nullptr);
+}
+
+TEST(AppendElement, MakesAChildThatKeepsItsTreeAlive) {
+  Ref<ElementNode> a = MakeElement("a");
+  const Ref<ElementNode> b(a->AppendElement("", "b"));
+  a.reset();
+  EXPECT_EQ(WriteElement(*static_cast<const ElementNode *>(b->GetParent())), "<a><b></b></a>");
+}
+
+TEST(AppendText, AppendsTextsInOrder) {
+  const Ref<ElementNode> a = MakeElement("a");
+  a->AppendText("one");
+  a->AppendElement("", "b");
+  a->AppendText("");
+  a->AppendText("two");
+  EXPECT_EQ(WriteElement(*a), "<a>one<b></b>two</a>");
+}
+
+TEST(AppendText, RefusesWhatXmlCannotCarryAndKeepsTheElement) {
+  const Ref<ElementNode> a = MakeElement("a");
+  for (const Forbidden &forbidden : FORBIDDEN) {
+    EXPECT_THROWS_MESSAGE(a->AppendText(forbidden.value), InvalidArgumentException,
+                          "Invalid argument : the text " + forbidden.message);
+  }
+  EXPECT_EQ(a->GetFirstChild(), nullptr);
 }
 
 TEST(AppendChild, RefusesNullDocumentsAndCycles) {

@@ -206,6 +206,16 @@ public:
   /// @throws InvalidStateException when `child` already is the child of an element.
   void AppendChild(Node *child);
 
+  /// Makes a new element the last child. It is made in the memory of this element's tree, so that it costs no allocation of
+  /// its own, and lives as long as the tree.
+  /// @throws InvalidArgumentException when prefix or local name is not a name without a colon (NCName).
+  ElementNode *AppendElement(std::string_view prefix, std::string_view localName);
+
+  /// Makes a new text node the last child, likewise. The memory of this element's tree is wiped when it is freed, since the
+  /// text may be secret.
+  /// @throws InvalidArgumentException when `value` is not UTF-8 or holds a character that XML 1.0 cannot carry.
+  void AppendText(std::string_view value);
+
   /// Writes the element and all below as UTF-8 XML, without an XML declaration. Text, attribute values and line ends are
   /// escaped so that a parser gives back the same tree, in either form; an element without children is written as
   /// "<name></name>".

@@ -56,11 +56,10 @@ private:
   void RequireUnsigned() const;
   void RequireSigned() const;
   std::vector<std::uint8_t> SignatureValue(const ElementNode &signedInfo, const Crypto::PrivateKey &key) const;
-  Ref<ElementNode> AppendElement(ElementNode &parent, std::string_view localName) const;
   void AppendMethod(ElementNode &parent, std::string_view localName, std::string_view uri) const;
   void AppendText(ElementNode &parent, std::string_view localName, const std::string &text) const;
   void AppendReference(ElementNode &signedInfo, std::size_t index, const Node &target) const;
-  Ref<ElementNode> AppendSignedInfo(ElementNode &signature) const;
+  const ElementNode &AppendSignedInfo(ElementNode &signature) const;
 
   const Ref<ElementNode> m_root;
   const SignatureAlgorithm m_algorithm;
@@ -104,16 +103,14 @@ void BlankSignature::Sign(const Crypto::PrivateKey &key) {
   CreateElementNode(m_prefix, "Signature", element);
   element->DefineAttribute(m_prefix.empty() ? "xmlns" : "xmlns:" + m_prefix, SignatureUri::NAMESPACE);
   std::vector<std::uint8_t> value;
-  Ref<ElementNode> signedInfo;
   try {
-    signedInfo = AppendSignedInfo(*element);
-    value = SignatureValue(*signedInfo, key);
+    value = SignatureValue(AppendSignedInfo(*element), key);
   } catch (const Crypto::CryptoException &exception) {
     throw XmlSecurityException(exception.what());
   }
   AppendText(*element, "SignatureValue", StringUtil::Base64Encode(value));
   if (m_keyInfoContent) {
-    AppendElement(*element, "KeyInfo")->AppendChild(m_keyInfoContent.get());
+    element->AppendElement(m_prefix, "KeyInfo")->AppendChild(m_keyInfoContent.get());
   }
   m_element = std::move(element);
 }
@@ -135,31 +132,31 @@ Ref<ElementNode> BlankSignature::GetElement() const {
   return m_element;
 }
 
-Ref<ElementNode> BlankSignature::AppendSignedInfo(ElementNode &signature) const {
+const ElementNode &BlankSignature::AppendSignedInfo(ElementNode &signature) const {
   std::vector<std::string_view> uris;
   for (const Reference &reference : m_references) {
     uris.push_back(reference.uri);
   }
   const std::vector<const Node *> targets = ResolveReferences(*m_root, uris);
-  Ref<ElementNode> signedInfo = AppendElement(signature, "SignedInfo");
-  AppendMethod(*signedInfo, "CanonicalizationMethod", CanonicalizationUri::EXCLUSIVE);
-  AppendMethod(*signedInfo, "SignatureMethod", m_signatureUri);
+  ElementNode &signedInfo = *signature.AppendElement(m_prefix, "SignedInfo");
+  AppendMethod(signedInfo, "CanonicalizationMethod", CanonicalizationUri::EXCLUSIVE);
+  AppendMethod(signedInfo, "SignatureMethod", m_signatureUri);
   for (std::size_t index = 0; index < m_references.size(); ++index) {
-    AppendReference(*signedInfo, index, *targets[index]);
+    AppendReference(signedInfo, index, *targets[index]);
   }
   return signedInfo;
 }
 
 void BlankSignature::AppendReference(ElementNode &signedInfo, std::size_t index, const Node &target) const {
   const DigestMethod &digestMethod = m_digestMethods[index];
-  const Ref<ElementNode> reference = AppendElement(signedInfo, "Reference");
-  reference->DefineAttribute("URI", m_references[index].uri);
-  AppendMethod(*AppendElement(*reference, "Transforms"), "Transform", CanonicalizationUri::EXCLUSIVE);
-  AppendMethod(*reference, "DigestMethod", digestMethod.uri);
+  ElementNode &reference = *signedInfo.AppendElement(m_prefix, "Reference");
+  reference.DefineAttribute("URI", m_references[index].uri);
+  AppendMethod(*reference.AppendElement(m_prefix, "Transforms"), "Transform", CanonicalizationUri::EXCLUSIVE);
+  AppendMethod(reference, "DigestMethod", digestMethod.uri);
   CanonicalMethod method;
   method.isExclusive = true;
   const DigestValue digest = DigestCanonicalForm(target, method, nullptr, digestMethod.algorithm);
-  AppendText(*reference, "DigestValue",
+  AppendText(reference, "DigestValue",
              StringUtil::Base64Encode(digest.data(), Crypto::DigestBytes(digestMethod.algorithm)));
 }
 
@@ -171,22 +168,12 @@ std::vector<std::uint8_t> BlankSignature::SignatureValue(const ElementNode &sign
   return Crypto::SignDigest(key, m_algorithm.scheme, m_algorithm.digest, digest.data());
 }
 
-Ref<ElementNode> BlankSignature::AppendElement(ElementNode &parent, std::string_view localName) const {
-  Ref<ElementNode> element;
-  CreateElementNode(m_prefix, localName, element);
-  parent.AppendChild(element.get());
-  return element;
-}
-
 void BlankSignature::AppendMethod(ElementNode &parent, std::string_view localName, std::string_view uri) const {
-  AppendElement(parent, localName)->DefineAttribute("Algorithm", uri);
+  parent.AppendElement(m_prefix, localName)->DefineAttribute("Algorithm", uri);
 }
 
 void BlankSignature::AppendText(ElementNode &parent, std::string_view localName, const std::string &text) const {
-  Ref<TextNode> node;
-  CreateTextNode(node);
-  node->SetValue(text);
-  AppendElement(parent, localName)->AppendChild(node.get());
+  parent.AppendElement(m_prefix, localName)->AppendText(text);
 }
 
 } // namespace

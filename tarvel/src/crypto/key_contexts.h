@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// Verification contexts that are ready for use, kept with the certificate whose key they hold.
+/// Contexts that are set up to check or to make signatures, kept with the certificate or the private key that they use.
 
 #pragma once
 
@@ -13,13 +13,15 @@
 
 namespace Tarvel::Crypto {
 
-/// The contexts of one key: to set one up costs a fifth of an RSA check. Lock-free; safe on any thread.
-class VerifyContexts {
+/// Contexts of one operation, checking or making signatures, and of one key. To set one up costs a fifth of an RSA check,
+/// and a context is for one thread at a time: so a thread takes one out, uses it and puts it back, the one of its own lane
+/// if it is there. Lock-free; safe on any thread.
+class KeyContexts {
 public:
-  VerifyContexts() = default;
-  VerifyContexts(const VerifyContexts &) = delete;
-  VerifyContexts &operator=(const VerifyContexts &) = delete;
-  ~VerifyContexts() { m_contexts.FreeAll(); }
+  KeyContexts() = default;
+  KeyContexts(const KeyContexts &) = delete;
+  KeyContexts &operator=(const KeyContexts &) = delete;
+  ~KeyContexts() { m_contexts.FreeAll(); }
 
   /// A context set up for `scheme` and `algorithm`; null when there is none at hand.
   KeyContextHandle Take(SignatureScheme scheme, DigestAlgorithm algorithm) noexcept {
