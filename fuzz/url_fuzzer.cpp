@@ -1,7 +1,11 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
 /// URLs: what is accepted can be written again from its parts and gives the same parts; the host is what follows the
-/// scheme; no part can end the line that it is sent in.
+/// scheme; no part can end the line that it is sent in. Whether a text is a URI reference at all, and what its parts are,
+/// libxml2 says too.
+
+#include "core/uri_reference.h"
+#include "unit/tarvel_core/uri_oracle.h"
 
 #include <tarvel/http/url.h>
 
@@ -60,6 +64,11 @@ std::string Write(const Parts &parts) {
 
 extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t *data, std::size_t size) {
   const std::string_view url(reinterpret_cast<const char *>(data), size);
+  if (url.find('\0') == std::string_view::npos) {
+    Require(Tarvel::CompareWithLibxml2(std::string(url)).disagreement.empty());
+  } else {
+    Require(!Tarvel::IsUriReference(url));
+  }
   Parts parts;
   if (!Parse(url, parts)) {
     return 0;

@@ -11,6 +11,7 @@ endfunction()
 
 ssoclient_mark(42 waits AServiceThatStalls.EndsALegAfterFortySecondsAndNoOtherRequestSoSoon)
 ssoclient_mark(20 in_full
+  GeneratedDocuments.AreReadByAllReadersAlikeButForNamedDifferences
   OneServiceOnSixteenThreadsOverTls.RunsTwentyThousandOperationsWithoutErrorOrGrowth
   OneServiceOnSixteenThreads.ComposesReadsAndVerifiesTwentyThousandTimesWithoutErrorOrGrowth
   Of/Truncation.EveryPrefixIsRefusedByTheParser/bearer_50k)

@@ -29,8 +29,8 @@ constexpr std::int64_t DEFAULT_CLOCK_TOLERANCE_SEC = 600;
 ///         when the signature is outside the accepted profile: another algorithm, more than ten references, an
 ///         identifier that no element bears, or more than one; or when a trusted key is not used: an RSA key of fewer than
 ///         2048 bits or with an exponent that is even or 1.
-/// @throws Tarvel::OutOfMemoryException, and Tarvel::InvalidStateException when OpenSSL has cleaned itself up because the
-///         process ends. Neither is a verdict on the token.
+/// @throws Tarvel::OutOfMemoryException or std::bad_alloc when memory runs out, and Tarvel::InvalidStateException when
+///         OpenSSL has cleaned itself up because the process ends. None of these is a verdict on the token.
 SSOCLIENT_API std::shared_ptr<const SamlToken>
 CreateSamlToken(const std::string &xml, const Tarvel::Crypto::CertificateList &trustedCertificates,
                 std::int64_t clockToleranceSec);

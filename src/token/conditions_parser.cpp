@@ -17,10 +17,9 @@ namespace SsoClient {
 namespace {
 
 using Tarvel::Xml::ElementNode;
-using Tarvel::Xml::QName;
 
 /// The `saml:Condition` of that type, or null when the cursor stands on something else.
-const ElementNode *ConditionOfType(const NodeFilterIterator &iterator, const QName &type) {
+const ElementNode *ConditionOfType(const NodeFilterIterator &iterator, const QNameView &type) {
   const ElementNode *const element = IteratorToElement(iterator);
   return ElementQNameIs(element, "Condition", Namespaces::SAML) && ElementXsiTypeIs(*element, type) ? element : nullptr;
 }
@@ -69,11 +68,11 @@ void ParseConditionsElement(NodeFilterIterator &iterator, ConditionsType &condit
 
 bool TryParseDelegationRestriction(NodeFilterIterator &iterator,
                                    boost::optional<DelegationRestrictionType> &restriction) {
-  const ElementNode *const element = ConditionOfType(iterator, SchemaNames::DelegationRestrictionType());
+  const ElementNode *const element = ConditionOfType(iterator, SchemaNames::DELEGATION_RESTRICTION_TYPE);
   if (!element) {
     return false;
   }
-  RequireElementAttributesQNames(*element, {SchemaNames::XsiType()}, {});
+  RequireElementAttributesQNames(*element, {SchemaNames::XSI_TYPE}, {});
   restriction.emplace();
   NodeFilterIterator child = iterator.GetChild();
   do {
@@ -122,11 +121,11 @@ bool TryParseProxyRestriction(NodeFilterIterator &iterator, boost::optional<Prox
 }
 
 bool TryParseRenewRestriction(NodeFilterIterator &iterator, boost::optional<RenewRestrictionType> &restriction) {
-  const ElementNode *const element = ConditionOfType(iterator, SchemaNames::RenewRestrictionType());
+  const ElementNode *const element = ConditionOfType(iterator, SchemaNames::RENEW_RESTRICTION_TYPE);
   if (!element) {
     return false;
   }
-  RequireElementAttributesQNames(*element, {SchemaNames::XsiType()},
+  RequireElementAttributesQNames(*element, {SchemaNames::XSI_TYPE},
                                  {LocalName("Count"), LocalName("Postdatable"), LocalName("RenewExpired")});
   restriction.emplace();
   GetULongOptionalAttribute(*element, "Count", restriction->Count);

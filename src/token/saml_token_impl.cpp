@@ -34,11 +34,13 @@ std::string Canonicalize(const ElementNode &element) {
 
 } // namespace
 
-SamlTokenImpl::SamlTokenImpl(const std::string &xml, const KeyInfoResolver &resolver, std::int64_t clockToleranceSec)
-    : m_xml(xml) {
-  Ref<Document> document;
-  ParseXML(xml, document);
-  InitializeFromDom(document ? document->GetDocumentElement() : nullptr, resolver, clockToleranceSec);
+SamlTokenImpl::SamlTokenImpl(const std::string &xml, const KeyInfoResolver &resolver, std::int64_t clockToleranceSec) {
+  {
+    Ref<Document> document;
+    ParseXML(xml, document);
+    InitializeFromDom(document ? document->GetDocumentElement() : nullptr, resolver, clockToleranceSec);
+  }
+  m_xml = xml; // not before the tree and its own copy of the text are gone: a large document needs one copy at a time
 }
 
 SamlTokenImpl::SamlTokenImpl(const ElementNode &element, const KeyInfoResolver &resolver,
@@ -49,7 +51,9 @@ SamlTokenImpl::SamlTokenImpl(const ElementNode &element, const KeyInfoResolver &
 
 void SamlTokenImpl::InitializeFromDom(const ElementNode *element, const KeyInfoResolver &resolver,
                                       std::int64_t clockToleranceSec) {
-  NodeFilterIterator iterator(element, std::make_shared<SkipWsAndCommentsFilter>());
+  // The filter outlives all cursors. So it is shared without a count, which would cost two atomic operations a cursor.
+  const SkipWsAndCommentsFilter filter;
+  NodeFilterIterator iterator(element, std::shared_ptr<const NodeFilter>(std::shared_ptr<void>(), &filter));
   SamlAssertionType assertion;
   ParseSamlAssertionElement(iterator, assertion);
   CheckTokenProperties(assertion, clockToleranceSec);

@@ -4,16 +4,14 @@
 
 #pragma once
 
-#include <tarvel/xml/qname.h>
+#include "model/namespaces.h"
+#include "xml/qualified_name.h"
 
 namespace SsoClient::SchemaNames {
 
-// Built with the first use, so that a static object of the host may read a token before this library's files have been
-// initialised; and never destroyed, for a token may be read while the process ends.
-
-const Tarvel::Xml::QName &XsiType();
-const Tarvel::Xml::QName &KeyInfoConfirmationDataType();
-const Tarvel::Xml::QName &DelegationRestrictionType();
-const Tarvel::Xml::QName &RenewRestrictionType();
+constexpr QNameView XSI_TYPE(Namespaces::XSI, "type");
+constexpr QNameView KEY_INFO_CONFIRMATION_DATA_TYPE(Namespaces::SAML, "KeyInfoConfirmationDataType");
+constexpr QNameView DELEGATION_RESTRICTION_TYPE(Namespaces::DELEGATION, "DelegationRestrictionType");
+constexpr QNameView RENEW_RESTRICTION_TYPE(Namespaces::RSA_SAML2, "RenewRestrictionType");
 
 } // namespace SsoClient::SchemaNames

@@ -19,7 +19,7 @@ void ParseAttributeValue(NodeFilterIterator &iterator, std::string &value) {
   const ElementNode &element = RequireElementQName(IteratorToElement(iterator), "AttributeValue", Namespaces::SAML);
   // Services may say the type of a value. It is not looked at: every value is taken as text.
   if (element.GetFirstAttribute()) {
-    RequireElementAttributesQNames(element, {}, {SchemaNames::XsiType()});
+    RequireElementAttributesQNames(element, {}, {SchemaNames::XSI_TYPE});
   }
   RequireTextualContent(iterator, value);
   iterator.MoveToSibling();

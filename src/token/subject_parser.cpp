@@ -67,9 +67,9 @@ void ParseX509DataElement(NodeFilterIterator &iterator, Ref<const Certificate> &
 
 void ParseHolderOfKeyData(const NodeFilterIterator &iterator, const ElementNode &element,
                           Ref<const Certificate> &certificate) {
-  RequireElementAttributesQNames(element, {SchemaNames::XsiType()}, {});
-  const std::string_view type = element.FindAttribute(SchemaNames::XsiType())->GetValue();
-  if (ResolveXsiType(element, type) != SchemaNames::KeyInfoConfirmationDataType()) {
+  RequireElementAttributesQNames(element, {SchemaNames::XSI_TYPE}, {});
+  const std::string_view type = element.FindAttribute(Namespaces::XSI, "type")->GetValue();
+  if (ResolveXsiType(element, type) != SchemaNames::KEY_INFO_CONFIRMATION_DATA_TYPE) {
     throw ParseException(MessageFormatter::ASPrint("Invalid SubjectConfirmationData type: '%1'", type));
   }
   NodeFilterIterator child = iterator.GetChild();

@@ -46,10 +46,14 @@ void TakeConditions(ConditionsType &conditions, TokenFacts &facts) {
   }
 }
 
-void PopulateTokenAttribute(const AttributeType &attribute, TokenFacts &facts) {
+void TakeTokenAttribute(AttributeType &attribute, TokenFacts &facts) {
   if (SamlAttributeIsGroupIdentity(attribute)) {
-    for (const std::string &value : attribute.values) {
-      facts.groups.push_back(ParseGroupIdentity(value));
+    if (facts.groups
+            .empty()) { // else the vector grows by itself: to reserve for each attribute would copy all each time
+      facts.groups.reserve(attribute.values.size());
+    }
+    for (std::string &value : attribute.values) {
+      facts.groups.push_back(ParseGroupIdentity(std::move(value)));
     }
   } else if (SamlAttributeIsSolution(attribute)) {
     facts.solution = ParseIsSolutionAttribute(attribute);
@@ -72,8 +76,8 @@ TokenFacts TakeTokenFacts(SamlAssertionType &&assertion) {
     facts.advice = std::move(assertion.Advice->advice);
   }
   if (assertion.AttributeStatement) {
-    for (const AttributeType &attribute : assertion.AttributeStatement->attributes) {
-      PopulateTokenAttribute(attribute, facts);
+    for (AttributeType &attribute : assertion.AttributeStatement->attributes) {
+      TakeTokenAttribute(attribute, facts);
     }
   }
   TakeConditions(assertion.Conditions, facts);
@@ -96,13 +100,15 @@ bool SamlAttributeIsSurName(const AttributeType &attribute) {
   return attribute.Name == SUR_NAME;
 }
 
-PrincipalId ParseGroupIdentity(const std::string &value) {
+PrincipalId ParseGroupIdentity(std::string value) {
   const std::size_t backslash = value.find('\\');
   if (!PartsInTwo(value, backslash)) {
     throw ParseException(
         MessageFormatter::ASPrint("Failed to parse Group Identity value: `%1'; domain or group missing", value));
   }
-  return {value.substr(backslash + 1), value.substr(0, backslash)};
+  std::string domain = value.substr(0, backslash);
+  value.erase(0, backslash + 1);
+  return {std::move(value), std::move(domain)};
 }
 
 PrincipalId ParseSamlNameId(const NameIDType &nameId) {

@@ -51,7 +51,7 @@ bool SamlAttributeIsSurName(const AttributeType &attribute);
 
 /// The group written as `domain\name`; the first backslash parts them.
 /// @throws ParseException when one of them is missing.
-PrincipalId ParseGroupIdentity(const std::string &value);
+PrincipalId ParseGroupIdentity(std::string value);
 
 /// The principal written as `name@domain`; the last at-sign parts them.
 /// @throws ParseException when the format is not the user principal name, or one of them is missing.

@@ -11,7 +11,7 @@
 namespace SsoClient {
 
 /// Decides on which nodes a cursor may stop. Immutable; safe on any thread. Held by a shared pointer that is made from
-/// the concrete type.
+/// the concrete type, or that owns nothing when the filter outlives the cursors.
 class NodeFilter {
 public:
   virtual bool Accept(const Tarvel::Xml::Node &node) const = 0;

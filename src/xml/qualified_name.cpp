@@ -14,15 +14,23 @@ using Tarvel::Xml::Attribute;
 using Tarvel::Xml::ElementNode;
 using Tarvel::Xml::QName;
 
-QName LocalName(std::string_view name) {
-  return QName(std::string(), std::string(name));
+namespace {
+using Tarvel::Xml::QName;
+
+QName ToQName(const QNameView &name) {
+  return QName(std::string(name.namespaceUri), std::string(name.localName));
 }
 
-void ResolveQName(const ElementNode &element, std::string_view text, std::string_view defaultNamespace, QName &name) {
+} // namespace
+
+std::string QNameView::ToString() const {
+  return ToQName(*this).ToString();
+}
+
+QNameView ResolveQName(const ElementNode &element, std::string_view text, std::string_view defaultNamespace) {
   const std::size_t colon = text.find(':');
   if (colon == std::string_view::npos) {
-    name = QName(std::string(defaultNamespace), std::string(text));
-    return;
+    return {defaultNamespace, text};
   }
   const std::string_view prefix = text.substr(0, colon);
   std::string_view namespaceUri;
@@ -32,24 +40,26 @@ void ResolveQName(const ElementNode &element, std::string_view text, std::string
                                                            element.GetName(), element.GetLine(), element.GetColumn(),
                                                            prefix));
   }
-  name = QName(std::string(namespaceUri), std::string(text.substr(colon + 1)));
+  return {namespaceUri, text.substr(colon + 1)};
+}
+
+void ResolveQName(const ElementNode &element, std::string_view text, std::string_view defaultNamespace, QName &name) {
+  name = ToQName(ResolveQName(element, text, defaultNamespace));
 }
 
 bool ElementQNameIs(const ElementNode *element, std::string_view localName, std::string_view namespaceUri) noexcept {
   return element && element->HasQName(namespaceUri, localName);
 }
 
-bool ElementXsiTypeIs(const ElementNode &element, const QName &type) {
+bool ElementXsiTypeIs(const ElementNode &element, const QNameView &type) {
   const Attribute *const attribute = element.FindAttribute(Namespaces::XSI, "type");
   return attribute && ResolveXsiType(element, attribute->GetValue()) == type;
 }
 
-QName ResolveXsiType(const ElementNode &element, std::string_view text) {
+QNameView ResolveXsiType(const ElementNode &element, std::string_view text) {
   std::string_view defaultNamespace;
   element.LookupNamespace(std::string_view(), defaultNamespace);
-  QName type;
-  ResolveQName(element, text, defaultNamespace, type);
-  return type;
+  return ResolveQName(element, text, defaultNamespace);
 }
 
 } // namespace SsoClient

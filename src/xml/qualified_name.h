@@ -7,17 +7,39 @@
 #include <tarvel/xml/node.h>
 #include <tarvel/xml/qname.h>
 
+#include <string>
 #include <string_view>
 
 namespace SsoClient {
 
+/// A qualified name whose texts belong to somebody else, so that names can be compared without being copied.
+struct QNameView {
+  std::string_view namespaceUri; ///< empty for a name in no namespace
+  std::string_view localName;
+
+  constexpr QNameView(std::string_view uri, std::string_view local) noexcept : namespaceUri(uri), localName(local) {}
+  QNameView(const Tarvel::Xml::QName &name) noexcept : QNameView(name.namespaceUri, name.localName) {}
+
+  friend bool operator==(const QNameView &, const QNameView &) = default;
+
+  /// As that of a `QName`.
+  std::string ToString() const;
+};
+
 /// The name `name` in no namespace, as attributes without a prefix have it.
-Tarvel::Xml::QName LocalName(std::string_view name);
+constexpr QNameView LocalName(std::string_view name) noexcept {
+  return {std::string_view(), name};
+}
 
 /// Reads a name that is written with or without prefix, by the namespace declarations in scope at `element`; the first
 /// colon ends the prefix. Without a colon the name is in `defaultNamespace`.
-/// @param name written on success only.
+/// @return a view into `text`, into the tree and into `defaultNamespace`.
 /// @throws ParseException when the prefix is not bound.
+QNameView ResolveQName(const Tarvel::Xml::ElementNode &element, std::string_view text,
+                       std::string_view defaultNamespace);
+
+/// The same as a name that owns its texts.
+/// @param name written on success only.
 void ResolveQName(const Tarvel::Xml::ElementNode &element, std::string_view text, std::string_view defaultNamespace,
                   Tarvel::Xml::QName &name);
 
@@ -27,10 +49,11 @@ bool ElementQNameIs(const Tarvel::Xml::ElementNode *element, std::string_view lo
 
 /// Whether `element` has an `xsi:type` that names `type`; without a prefix it names a type of the default namespace.
 /// @throws ParseException when the type's prefix is not bound.
-bool ElementXsiTypeIs(const Tarvel::Xml::ElementNode &element, const Tarvel::Xml::QName &type);
+bool ElementXsiTypeIs(const Tarvel::Xml::ElementNode &element, const QNameView &type);
 
 /// Reads `text`, the value of an `xsi:type` of `element`, as a name; without a prefix it is of the default namespace.
+/// @return a view into `text` and into the tree.
 /// @throws ParseException when the prefix is not bound.
-Tarvel::Xml::QName ResolveXsiType(const Tarvel::Xml::ElementNode &element, std::string_view text);
+QNameView ResolveXsiType(const Tarvel::Xml::ElementNode &element, std::string_view text);
 
 } // namespace SsoClient

@@ -1,8 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "xml/strict_checks.h"
 
-#include "xml/qualified_name.h"
-
 #include <ssoclient/exceptions.h>
 #include <tarvel/core/exception.h>
 #include <tarvel/core/message_formatter.h>
@@ -18,7 +16,6 @@ namespace {
 
 using Tarvel::Xml::Attribute;
 using Tarvel::Xml::ElementNode;
-using Tarvel::Xml::QName;
 
 constexpr std::string_view DEFAULT_DECLARATION = "xmlns";
 constexpr std::string_view PREFIX_DECLARATION = "xmlns:";
@@ -34,8 +31,7 @@ template <typename... Args>
   Refuse("Node '%1 is missing required attribute '%2'", element.GetName(), name);
 }
 
-std::string_view NameAt(const NodeFilterIterator &iterator) {
-  const ElementNode *const element = IteratorToElement(iterator);
+std::string_view NameOf(const ElementNode *element) {
   return element ? element->GetName() : std::string_view();
 }
 
@@ -62,18 +58,18 @@ bool HasAttributeWritten(const ElementNode &element, std::string_view name) {
 
 const ElementNode &RequireElementQName(const ElementNode *element, std::string_view localName,
                                        std::string_view namespaceUri) {
+  if (ElementQNameIs(element, localName, namespaceUri)) {
+    return *element;
+  }
   if (!element || element->GetLocalName() != localName) {
     Refuse("Expected element '%1' not found.", localName);
   }
-  if (!ElementQNameIs(element, localName, namespaceUri)) {
-    Refuse("Element '%1' has unexpected namespace", element->GetName());
-  }
-  return *element;
+  Refuse("Element '%1' has unexpected namespace", element->GetName());
 }
 
 void RequireEmptyElement(NodeFilterIterator iterator) {
   if (iterator.GetChild().node) {
-    Refuse("Element '%1' must be empty", NameAt(iterator));
+    Refuse("Element '%1' must be empty", NameOf(IteratorToElement(iterator)));
   }
 }
 
@@ -103,32 +99,29 @@ void RequireElementAttributesNames(const ElementNode &element, std::initializer_
   }
 }
 
-void RequireElementAttributesQNames(const ElementNode &element, const std::vector<QName> &required,
-                                    const std::vector<QName> &optional) {
-  std::vector<QName> found;
+void RequireElementAttributesQNames(const ElementNode &element, std::initializer_list<QNameView> required,
+                                    std::initializer_list<QNameView> optional) {
   for (const Attribute *attribute = element.GetFirstAttribute(); attribute; attribute = attribute->GetNext()) {
     if (IsDeclaration(attribute->GetName())) {
       continue;
     }
-    QName name;
-    ResolveQName(element, attribute->GetName(), std::string_view(), name);
+    const QNameView name = ResolveQName(element, attribute->GetName(), std::string_view());
     if (!Contains(required, name) && !Contains(optional, name)) {
       Refuse("Unexpected attribute '%1' on element '%2'", name.ToString(), element.GetName());
     }
-    found.push_back(std::move(name));
   }
-  for (const QName &name : required) {
-    if (!Contains(found, name)) {
+  for (const QNameView &name : required) {
+    if (!element.FindAttribute(name.namespaceUri, name.localName)) {
       RefuseMissingAttribute(element, name.ToString());
     }
   }
 }
 
 void RequireTextualContent(NodeFilterIterator iterator, std::string &text) {
-  NodeFilterIterator child = iterator.GetChild();
-  const Tarvel::Xml::TextNode *const textNode = Tarvel::Xml::AsText(child.node);
-  if (!textNode || child.MoveToSibling().node) {
-    Refuse("Element '%1' must only have textual content (but has extra children or is empty).", NameAt(iterator));
+  const ElementNode *const element = IteratorToElement(iterator);
+  const Tarvel::Xml::TextNode *const textNode = Tarvel::Xml::AsText(iterator.MoveToChild().node);
+  if (!textNode || iterator.MoveToSibling().node) {
+    Refuse("Element '%1' must only have textual content (but has extra children or is empty).", NameOf(element));
   }
   text = textNode->GetValue();
 }

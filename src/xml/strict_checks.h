@@ -8,10 +8,10 @@
 #pragma once
 
 #include "xml/node_filter_iterator.h"
+#include "xml/qualified_name.h"
 
 #include <tarvel/system/date_time.h>
 #include <tarvel/xml/node.h>
-#include <tarvel/xml/qname.h>
 
 #include <boost/optional.hpp>
 
@@ -19,7 +19,6 @@
 #include <initializer_list>
 #include <string>
 #include <string_view>
-#include <vector>
 
 namespace SsoClient {
 
@@ -43,9 +42,8 @@ void RequireElementAttributesNames(const Tarvel::Xml::ElementNode &element,
                                    std::initializer_list<std::string_view> optional);
 
 /// The same for attributes that are told apart by qualified name.
-void RequireElementAttributesQNames(const Tarvel::Xml::ElementNode &element,
-                                    const std::vector<Tarvel::Xml::QName> &required,
-                                    const std::vector<Tarvel::Xml::QName> &optional);
+void RequireElementAttributesQNames(const Tarvel::Xml::ElementNode &element, std::initializer_list<QNameView> required,
+                                    std::initializer_list<QNameView> optional);
 
 /// The element that the cursor stands on must hold one text and nothing else. Two texts with a comment between them are
 /// two: a comment cannot cut a value short. It can only cut off white space at either end, which alone is no text here.

@@ -5,6 +5,7 @@
 
 #pragma once
 
+#include <atomic>
 #include <cstddef>
 #include <cstdlib>
 #include <new>
@@ -14,12 +15,20 @@ namespace Testing {
 /// Called for each allocation, on its thread: whether it fails. Must not allocate.
 bool IsMemoryRefused() noexcept;
 
+inline std::atomic<long> g_liveAllocations{0}; // that have not been given back
+
 inline void *AllocateUnlessRefused(std::size_t bytes) {
   void *const memory = IsMemoryRefused() ? nullptr : std::malloc(bytes ? bytes : 1);
   if (!memory) {
     throw std::bad_alloc();
   }
+  ++g_liveAllocations;
   return memory;
+}
+
+inline void Free(void *memory) noexcept {
+  g_liveAllocations -= memory ? 1 : 0;
+  std::free(memory);
 }
 
 } // namespace Testing
@@ -31,14 +40,14 @@ void *operator new[](std::size_t bytes) {
   return Testing::AllocateUnlessRefused(bytes);
 }
 void operator delete(void *memory) noexcept {
-  std::free(memory);
+  Testing::Free(memory);
 }
 void operator delete[](void *memory) noexcept {
-  std::free(memory);
+  Testing::Free(memory);
 }
 void operator delete(void *memory, std::size_t) noexcept {
-  std::free(memory);
+  Testing::Free(memory);
 }
 void operator delete[](void *memory, std::size_t) noexcept {
-  std::free(memory);
+  Testing::Free(memory);
 }

@@ -2,6 +2,7 @@
 
 #include <tarvel/core/string_util.h>
 
+#include "core/ascii_case.h"
 #include "system/fork_gate.h"
 
 #include <algorithm>
@@ -110,6 +111,11 @@ std::string StringUtil::ToUpper(std::string_view text) {
 
 std::string StringUtil::ToLower(std::string_view text) {
   return MapCase(text, LowerAscii, ::towlower_l);
+}
+
+bool EqualsIgnoringCase(std::string_view left, std::string_view right) noexcept {
+  return std::equal(left.begin(), left.end(), right.begin(), right.end(),
+                    [](char a, char b) { return LowerAscii(a) == LowerAscii(b); });
 }
 
 } // namespace Tarvel

@@ -3,9 +3,11 @@
 #include "crypto/digest.h"
 
 #include "crypto/digest_method.h"
+#include "crypto/kept_contexts.h"
 #include "crypto/library_context.h"
-#include "crypto/openssl_errors.h"
 #include "crypto/openssl_handles.h"
+
+#include <utility>
 
 namespace Tarvel::Crypto {
 
@@ -19,6 +21,13 @@ const EVP_MD *FetchDigestMethod(const char *name) {
     errors.Throw(std::string("The cryptographic library does not offer ") + name);
   }
   return method;
+}
+
+// Of SHA-256 alone: nearly every digest is one, and OpenSSL wipes its last block of the message when it ends.
+constinit KeptContexts<DigestContextHandle, 1> keptContexts;
+
+bool IsKept(DigestAlgorithm algorithm) {
+  return algorithm == DigestAlgorithm::SHA256;
 }
 
 EVP_MD_CTX *AsDigestContext(void *context) {
@@ -44,33 +53,38 @@ const EVP_MD *GetDigestMethod(DigestAlgorithm algorithm) {
   return sha256;
 }
 
-Digest::Digest(DigestAlgorithm algorithm) : m_context(nullptr) {
+Digest::Digest(DigestAlgorithm algorithm) : m_algorithm(algorithm), m_context(nullptr) {
   OpenSslUse::Prepare();
   m_use.Require();
+  m_errors.emplace();
   const EVP_MD *const method = GetDigestMethod(algorithm);
-  const OpenSslErrorScope errors;
-  DigestContextHandle context(EVP_MD_CTX_new());
+  DigestContextHandle context = IsKept(algorithm) ? keptContexts.Take(0) : nullptr;
+  if (!context) {
+    context.reset(EVP_MD_CTX_new());
+  }
   if (!context || EVP_DigestInit_ex2(context.get(), method, nullptr) != 1) {
-    errors.Throw("Failed to begin a digest");
+    m_errors->Throw("Failed to begin a digest");
   }
   m_context = context.release();
 }
 
+// A context in the middle of a message may hold a piece of it, and OpenSSL wipes what it frees.
 Digest::~Digest() {
   EVP_MD_CTX_free(AsDigestContext(m_context));
 }
 
 void Digest::Update(std::string_view bytes) {
-  const OpenSslErrorScope errors;
   if (EVP_DigestUpdate(AsDigestContext(m_context), bytes.data(), bytes.size()) != 1) {
-    errors.Throw("Failed to compute a digest");
+    m_errors->Throw("Failed to compute a digest");
   }
 }
 
 void Digest::Finish(std::uint8_t *out) {
-  const OpenSslErrorScope errors;
   if (EVP_DigestFinal_ex(AsDigestContext(m_context), out, nullptr) != 1) {
-    errors.Throw("Failed to finish a digest");
+    m_errors->Throw("Failed to finish a digest");
+  }
+  if (IsKept(m_algorithm)) {
+    keptContexts.Put(0, DigestContextHandle(AsDigestContext(std::exchange(m_context, nullptr))));
   }
 }
 

@@ -4,11 +4,12 @@
 
 #pragma once
 
+#include "crypto/openssl_errors.h"
 #include "crypto/openssl_use.h"
 
 #include <cstddef>
 #include <cstdint>
-#include <memory>
+#include <optional>
 #include <string_view>
 
 namespace Tarvel::Crypto {
@@ -21,7 +22,8 @@ constexpr std::size_t DigestBytes(DigestAlgorithm algorithm) noexcept {
   return algorithm == DigestAlgorithm::SHA256 ? 32 : algorithm == DigestAlgorithm::SHA384 ? 48 : 64;
 }
 
-/// A digest in the making. For one thread.
+/// A digest in the making. For one thread, and a local variable there: what else uses OpenSSL on the thread meanwhile must end
+/// first.
 class Digest {
 public:
   /// @throws CryptoException when the cryptographic library does not offer the algorithm; InvalidStateException when it has
@@ -39,7 +41,9 @@ public:
 
 private:
   const OpenSslUse m_use;
-  void *m_context; // EVP_MD_CTX
+  std::optional<OpenSslErrorScope> m_errors; // always there, but begun only when OpenSSL may be called
+  const DigestAlgorithm m_algorithm;
+  void *m_context; // EVP_MD_CTX; null once it is finished
 };
 
 } // namespace Tarvel::Crypto

@@ -4,13 +4,12 @@
 
 #pragma once
 
+#include "crypto/kept_contexts.h"
 #include "crypto/openssl_handles.h"
 #include "crypto/public_key.h"
-#include "system/thread_lane.h"
 
-#include <array>
-#include <atomic>
 #include <cstddef>
+#include <utility>
 
 namespace Tarvel::Crypto {
 
@@ -22,27 +21,27 @@ public:
   KeyContexts() = default;
   KeyContexts(const KeyContexts &) = delete;
   KeyContexts &operator=(const KeyContexts &) = delete;
-  ~KeyContexts();
+  ~KeyContexts() { m_contexts.FreeAll(); }
 
   /// A context set up for `scheme` and `algorithm`; null when there is none at hand.
-  KeyContextHandle Take(SignatureScheme scheme, DigestAlgorithm algorithm) noexcept;
+  KeyContextHandle Take(SignatureScheme scheme, DigestAlgorithm algorithm) noexcept {
+    return m_contexts.Take(KindOf(scheme, algorithm));
+  }
 
   /// Keeps `context` for the next taker, or frees it when enough are kept already.
-  void Put(SignatureScheme scheme, DigestAlgorithm algorithm, KeyContextHandle context) noexcept;
+  void Put(SignatureScheme scheme, DigestAlgorithm algorithm, KeyContextHandle context) noexcept {
+    m_contexts.Put(KindOf(scheme, algorithm), std::move(context));
+  }
 
 private:
   static constexpr std::size_t SCHEMES = 3;
   static constexpr std::size_t ALGORITHMS = 3;
-  static constexpr std::size_t LANES = 4; // threads beyond these that use one key at once set up their own
 
-  struct alignas(System::LANE_ALIGNMENT) Lane {
-    std::array<std::atomic<EVP_PKEY_CTX *>, SCHEMES * ALGORITHMS> contexts{};
-  };
+  static std::size_t KindOf(SignatureScheme scheme, DigestAlgorithm algorithm) noexcept {
+    return static_cast<std::size_t>(scheme) * ALGORITHMS + static_cast<std::size_t>(algorithm);
+  }
 
-  /// Of the lanes, counted from the calling thread's own.
-  std::atomic<EVP_PKEY_CTX *> &GetSlot(std::size_t lane, SignatureScheme scheme, DigestAlgorithm algorithm) noexcept;
-
-  std::array<Lane, LANES> m_lanes;
+  KeptContexts<KeyContextHandle, SCHEMES * ALGORITHMS> m_contexts;
 };
 
 } // namespace Tarvel::Crypto

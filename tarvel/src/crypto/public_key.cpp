@@ -57,9 +57,14 @@ bool SetScheme(EVP_PKEY_CTX *context, SignatureScheme scheme, DigestAlgorithm al
   return true;
 }
 
-KeyContextHandle NewVerifyContext(EVP_PKEY *key, SignatureScheme scheme, DigestAlgorithm algorithm) {
+// Each context has a key of its own, since OpenSSL locks a key for each use of it, and threads would wait for each other.
+KeyContextHandle NewVerifyContext(EVP_PKEY *sharedKey, SignatureScheme scheme, DigestAlgorithm algorithm) {
   const OpenSslErrorScope errors;
-  KeyContextHandle context(EVP_PKEY_CTX_new_from_pkey(GetLibraryContext(), key, nullptr));
+  const KeyHandle key(EVP_PKEY_dup(sharedKey));
+  if (!key) {
+    errors.Throw("Failed to set up a signature check");
+  }
+  KeyContextHandle context(EVP_PKEY_CTX_new_from_pkey(GetLibraryContext(), key.get(), nullptr));
   if (!context || EVP_PKEY_verify_init(context.get()) <= 0 || !SetScheme(context.get(), scheme, algorithm)) {
     errors.Throw("Failed to set up a signature check");
   }

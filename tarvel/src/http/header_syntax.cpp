@@ -8,13 +8,8 @@ namespace Tarvel::Http {
 
 namespace {
 
-char ToLowerAscii(char c) noexcept {
-  return c >= 'A' && c <= 'Z' ? static_cast<char>(c - 'A' + 'a') : c;
-}
-
 bool IsTokenCharacter(char c) noexcept {
-  const char lower = ToLowerAscii(c);
-  return (lower >= 'a' && lower <= 'z') || (c >= '0' && c <= '9') ||
+  return (c >= 'a' && c <= 'z') || (c >= 'A' && c <= 'Z') || (c >= '0' && c <= '9') ||
          (c != '\0' && std::string_view("!#$%&'*+-.^_`|~").find(c) != std::string_view::npos);
 }
 
@@ -31,11 +26,6 @@ bool IsToken(std::string_view text) noexcept {
 
 bool IsFieldValue(std::string_view text) noexcept {
   return std::none_of(text.begin(), text.end(), IsControlCharacter);
-}
-
-bool EqualsIgnoringCase(std::string_view left, std::string_view right) noexcept {
-  return std::equal(left.begin(), left.end(), right.begin(), right.end(),
-                    [](char a, char b) { return ToLowerAscii(a) == ToLowerAscii(b); });
 }
 
 std::string_view TrimBlanks(std::string_view text) noexcept {

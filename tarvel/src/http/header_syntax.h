@@ -1,8 +1,10 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// What may stand in the header of an HTTP message (RFC 9110, section 5), and how its texts compare.
+/// What may stand in the header of an HTTP message (RFC 9110, section 5).
 
 #pragma once
+
+#include "core/ascii_case.h"
 
 #include <string>
 #include <string_view>
@@ -21,9 +23,6 @@ bool IsToken(std::string_view text) noexcept;
 
 /// A text without control characters, so that it cannot end a line.
 bool IsFieldValue(std::string_view text) noexcept;
-
-/// Letter case of ASCII letters aside.
-bool EqualsIgnoringCase(std::string_view left, std::string_view right) noexcept;
 
 /// Without the blanks and tabs around it.
 std::string_view TrimBlanks(std::string_view text) noexcept;

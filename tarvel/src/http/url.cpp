@@ -2,15 +2,15 @@
 
 #include <tarvel/http/url.h>
 
+#include "core/uri_reference.h"
 #include "http/header_syntax.h"
 
 #include <tarvel/core/string_util.h>
 
-#include <libxml/uri.h>
-
 #include <algorithm>
 #include <arpa/inet.h>
-#include <memory>
+#include <charconv>
+#include <optional>
 
 namespace Tarvel {
 namespace Http {
@@ -24,11 +24,6 @@ constexpr int HTTPS_PORT = 443;
 constexpr int MAX_PORT = 65535;
 constexpr std::size_t MAX_HOST_LENGTH = 253; // RFC 1035, section 2.3.4, without the root's dot
 constexpr std::size_t MAX_LABEL_LENGTH = 63;
-
-struct UriDeleter {
-  void operator()(xmlURI *uri) const { xmlFreeURI(uri); }
-};
-using UriHandle = std::unique_ptr<xmlURI, UriDeleter>;
 
 bool IsDigit(char c) noexcept {
   return c >= '0' && c <= '9';
@@ -92,18 +87,26 @@ void CheckCharacters(std::string_view url) {
   }
 }
 
-/// Path and query stay as they are written: unescaping would change what they mean.
-UriHandle Parse(std::string_view url) {
-  constexpr int RAW = 1;
-  UriHandle uri(xmlParseURIRaw(std::string(url).c_str(), RAW));
-  if (!uri) {
-    Refuse(url, "it does not have the form of a URL");
+/// What `digits` say; nothing when there is none or no integer holds it.
+std::optional<int> ReadNumber(std::string_view digits) noexcept {
+  int number = 0;
+  if (std::from_chars(digits.data(), digits.data() + digits.size(), number).ec != std::errc()) {
+    return std::nullopt;
   }
-  return uri;
+  return number;
 }
 
-bool IsSecureScheme(std::string_view url, const xmlURI &uri) {
-  const std::string_view scheme = uri.scheme ? uri.scheme : "";
+/// What is in the brackets of an address, and the range of the port, have messages of their own.
+UriReference Parse(std::string_view url) {
+  const std::optional<UriReference> parts = SplitUriReference(url);
+  if (!parts || (parts->port && !ReadNumber(*parts->port))) {
+    Refuse(url, "it does not have the form of a URL");
+  }
+  return *parts;
+}
+
+bool IsSecureScheme(std::string_view url, const UriReference &parts) {
+  const std::string_view scheme = parts.scheme.value_or("");
   if (EqualsIgnoringCase(scheme, "https")) {
     return true;
   }
@@ -167,59 +170,50 @@ void CheckHostName(std::string_view url, const std::string &host) {
   }
 }
 
-int ParsePort(std::string_view url, std::string_view text) {
-  int port = 0;
-  for (const char c : text) {
-    if (!IsDigit(c)) {
-      Refuse(url, "the port is not a number");
-    }
-    port = port * 10 + (c - '0');
-    if (port > MAX_PORT) {
-      break;
-    }
+std::string FindHost(std::string_view url, const UriReference &parts) {
+  if (parts.userInformation) {
+    Refuse(url, "it holds user information");
   }
+  std::string host(parts.host.value_or(""));
+  if (host.empty()) {
+    Refuse(url, "the host is missing");
+  }
+  if (host.front() == '[') {
+    host = host.substr(1, host.size() - 2);
+    CheckIPv6Address(url, host);
+  } else {
+    CheckHostName(url, host);
+  }
+  return host;
+}
+
+int FindPort(std::string_view url, const UriReference &parts, int defaultPort) {
+  const int port = parts.port ? ReadNumber(*parts.port).value_or(0) : defaultPort;
   if (port < 1 || port > MAX_PORT) {
     Refuse(url, "the port is not between 1 and 65535");
   }
   return port;
 }
 
-/// Takes "host", "host:port", "[address]" or "[address]:port" apart.
-void ParseAuthority(std::string_view url, int defaultPort, std::string &host, int &port) {
-  const std::string_view authority = FindAuthority(url);
-  if (authority.find('@') != std::string_view::npos) {
-    Refuse(url, "it holds user information");
+/// Path and query stay as they are written: unescaping would change what they mean.
+std::string FindPath(const UriReference &parts) {
+  std::string path(parts.path.empty() ? "/" : parts.path);
+  if (parts.query) {
+    path.append("?").append(*parts.query);
   }
-  const bool isBracketed = !authority.empty() && authority.front() == '[';
-  const std::size_t hostEnd = isBracketed ? authority.find(']') + 1 : std::min(authority.find(':'), authority.size());
-  host = std::string(authority.substr(0, hostEnd));
-  if (host.empty()) {
-    Refuse(url, "the host is missing");
-  }
-  if (isBracketed) {
-    host = host.substr(1, host.size() - 2);
-    CheckIPv6Address(url, host);
-  } else {
-    CheckHostName(url, host);
-  }
-  const std::string_view rest = authority.substr(hostEnd);
-  port = rest.empty() ? defaultPort : ParsePort(url, rest.substr(1));
+  return path;
 }
 
 } // namespace
 
 void ParseHttpURL(std::string_view url, bool &isSecure, std::string &host, int &port, std::string &path) {
   CheckCharacters(url);
-  const UriHandle uri = Parse(url);
-  const bool secure = IsSecureScheme(url, *uri);
-  std::string foundHost;
-  int foundPort = 0;
-  ParseAuthority(url, secure ? HTTPS_PORT : HTTP_PORT, foundHost, foundPort);
+  const UriReference parts = Parse(url);
+  const bool secure = IsSecureScheme(url, parts);
+  std::string foundHost = FindHost(url, parts);
+  const int foundPort = FindPort(url, parts, secure ? HTTPS_PORT : HTTP_PORT);
 
-  path = uri->path && *uri->path ? uri->path : "/";
-  if (uri->query_raw) {
-    path.append("?").append(uri->query_raw);
-  }
+  path = FindPath(parts);
   isSecure = secure;
   host = std::move(foundHost);
   port = foundPort;

@@ -31,30 +31,32 @@ bool IsIn(const Range (&ranges)[N], std::uint32_t character) noexcept {
                      [character](const Range &range) { return range.first <= character && character <= range.last; });
 }
 
-bool IsNameStart(std::uint32_t c) noexcept {
-  if (c < 0x80) {
-    return (c >= 'a' && c <= 'z') || (c >= 'A' && c <= 'Z') || c == '_';
-  }
-  return IsIn(NAME_START_RANGES, c);
-}
-
-bool IsNameCharacter(std::uint32_t c) noexcept {
-  if (c < 0x80) {
-    return IsNameStart(c) || (c >= '0' && c <= '9') || c == '-' || c == '.';
-  }
-  return IsIn(NAME_START_RANGES, c) || IsIn(NAME_MORE_RANGES, c);
-}
-
-/// Char of XML 1.0, production 2.
-bool IsXmlCharacter(std::uint32_t c) noexcept {
-  if (c < 0x20) {
-    return c == '\t' || c == '\n' || c == '\r';
-  }
-  return c <= 0xD7FF || (c >= 0xE000 && c <= 0xFFFD) || (c >= 0x10000 && c <= 0x10FFFF);
-}
-
 std::uint32_t Byte(std::string_view text, std::size_t offset) noexcept {
   return static_cast<unsigned char>(text[offset]);
+}
+
+/// The offset of the first byte above 0x7F, or `npos`.
+std::size_t FindNonAscii(std::string_view text) noexcept {
+  constexpr std::size_t BLOCK = 64; // four words side by side keep the loop short without hiding the place
+  constexpr std::uint64_t HIGH_BITS = 0x8080808080808080u;
+  std::size_t offset = 0;
+  for (; text.size() - offset >= BLOCK; offset += BLOCK) {
+    std::uint64_t words[BLOCK / sizeof(std::uint64_t)];
+    std::memcpy(words, text.data() + offset, BLOCK);
+    std::uint64_t all = 0;
+    for (const std::uint64_t word : words) {
+      all |= word;
+    }
+    if (all & HIGH_BITS) {
+      break;
+    }
+  }
+  for (; offset < text.size(); ++offset) {
+    if (Byte(text, offset) >= 0x80) {
+      return offset;
+    }
+  }
+  return std::string_view::npos;
 }
 
 /// The length of a beginning of `text` that holds nothing but ASCII from the blank on, found by eight bytes at a time.
@@ -72,6 +74,55 @@ std::size_t CountPlainAscii(std::string_view text) noexcept {
 }
 
 } // namespace
+
+bool IsNameStart(std::uint32_t character) noexcept {
+  if (character < 0x80) {
+    return (character >= 'a' && character <= 'z') || (character >= 'A' && character <= 'Z') || character == '_';
+  }
+  return IsIn(NAME_START_RANGES, character);
+}
+
+bool IsNameCharacter(std::uint32_t character) noexcept {
+  if (character < 0x80) {
+    return IsNameStart(character) || (character >= '0' && character <= '9') || character == '-' || character == '.';
+  }
+  return IsIn(NAME_START_RANGES, character) || IsIn(NAME_MORE_RANGES, character);
+}
+
+bool IsXmlCharacter(std::uint32_t character) noexcept {
+  if (character < 0x20) {
+    return character == '\t' || character == '\n' || character == '\r';
+  }
+  return character <= 0xD7FF || (character >= 0xE000 && character <= 0xFFFD) ||
+         (character >= 0x10000 && character <= 0x10FFFF);
+}
+
+std::string FormatCharacter(std::uint32_t character) {
+  char code[16];
+  std::snprintf(code, sizeof code, "U+%04X", static_cast<unsigned>(character));
+  return code;
+}
+
+char *WriteCharacter(std::uint32_t character, char *target) noexcept {
+  const auto put = [&target](std::uint32_t byte) { *target++ = static_cast<char>(byte); };
+  const auto putLower = [&put, character](unsigned shift) { put(0x80 | (character >> shift & 0x3F)); };
+  if (character < 0x80) {
+    put(character);
+  } else if (character < 0x800) {
+    put(0xC0 | character >> 6);
+    putLower(0);
+  } else if (character < 0x10000) {
+    put(0xE0 | character >> 12);
+    putLower(6);
+    putLower(0);
+  } else {
+    put(0xF0 | character >> 18);
+    putLower(12);
+    putLower(6);
+    putLower(0);
+  }
+  return target;
+}
 
 std::uint32_t ReadCharacter(std::string_view text, std::size_t &offset) noexcept {
   const std::uint32_t lead = Byte(text, offset);
@@ -100,29 +151,6 @@ std::uint32_t ReadCharacter(std::string_view text, std::size_t &offset) noexcept
   return character;
 }
 
-std::size_t FindNonAscii(std::string_view text) noexcept {
-  constexpr std::size_t BLOCK = 64; // four words side by side keep the loop short without hiding the place
-  constexpr std::uint64_t HIGH_BITS = 0x8080808080808080u;
-  std::size_t offset = 0;
-  for (; text.size() - offset >= BLOCK; offset += BLOCK) {
-    std::uint64_t words[BLOCK / sizeof(std::uint64_t)];
-    std::memcpy(words, text.data() + offset, BLOCK);
-    std::uint64_t all = 0;
-    for (const std::uint64_t word : words) {
-      all |= word;
-    }
-    if (all & HIGH_BITS) {
-      break;
-    }
-  }
-  for (; offset < text.size(); ++offset) {
-    if (Byte(text, offset) >= 0x80) {
-      return offset;
-    }
-  }
-  return std::string_view::npos;
-}
-
 std::size_t FindInvalidUtf8(std::string_view text) noexcept {
   std::size_t offset = 0;
   while (offset < text.size()) {
@@ -149,10 +177,8 @@ std::string DescribeForbiddenCharacter(std::string_view what, std::string_view t
       return std::string(what) + " is not UTF-8 at byte " + std::to_string(begin + 1);
     }
     if (!IsXmlCharacter(character)) {
-      char code[16];
-      std::snprintf(code, sizeof code, "U+%04X", static_cast<unsigned>(character));
-      return std::string(what) + " holds the character " + code + " at byte " + std::to_string(begin + 1) +
-             ", which XML 1.0 cannot carry";
+      return std::string(what) + " holds the character " + FormatCharacter(character) + " at byte " +
+             std::to_string(begin + 1) + ", which XML 1.0 cannot carry";
     }
   }
   return std::string();

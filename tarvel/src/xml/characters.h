@@ -21,12 +21,23 @@ std::uint32_t ReadCharacter(std::string_view text, std::size_t &offset) noexcept
 /// The offset of the first byte that is not part of well-formed UTF-8, or `npos`.
 std::size_t FindInvalidUtf8(std::string_view text) noexcept;
 
-/// The offset of the first byte above 0x7F, or `npos`.
-std::size_t FindNonAscii(std::string_view text) noexcept;
-
 /// What keeps an XML 1.0 document from carrying `text` ("... holds the character U+0001, ..."), or nothing. `what` names
 /// the text at the beginning of the message.
 std::string DescribeForbiddenCharacter(std::string_view what, std::string_view text);
+
+/// Whether a name without a colon (NCName) may begin with the character (NameStartChar, production 4), or go on with it
+/// (NameChar, production 4a).
+bool IsNameStart(std::uint32_t character) noexcept;
+bool IsNameCharacter(std::uint32_t character) noexcept;
+
+/// Whether XML 1.0 can carry the character (Char, production 2).
+bool IsXmlCharacter(std::uint32_t character) noexcept;
+
+/// The character as "U+0041".
+std::string FormatCharacter(std::uint32_t character);
+
+/// Appends the character as UTF-8. @param target has room for four bytes. @return what follows it.
+char *WriteCharacter(std::uint32_t character, char *target) noexcept;
 
 /// Whether `name` is an NCName: a name without a colon.
 bool IsNcName(std::string_view name) noexcept;

@@ -4,6 +4,7 @@
 
 #include "xml/characters.h"
 #include "xml/node_arena.h"
+#include "xml/reserved_namespaces.h"
 
 #include <tarvel/core/exception.h>
 #include <tarvel/core/string_util.h>
@@ -15,9 +16,6 @@ namespace Tarvel {
 namespace Xml {
 
 namespace {
-
-constexpr std::string_view XML_NAMESPACE = "http://www.w3.org/XML/1998/namespace";
-constexpr std::string_view XMLNS_NAMESPACE = "http://www.w3.org/2000/xmlns/";
 
 // What a composed message needs: an element with a few attributes, a short text.
 constexpr std::size_t ELEMENT_ARENA_BYTES = 512;
@@ -201,7 +199,7 @@ void ElementNode::DefineAttribute(std::string_view qualifiedName, std::string_vi
     }
   }
   const std::string_view name = m_arena->Copy(qualifiedName);
-  AppendAttribute(name, m_arena->Copy(value));
+  AppendAttribute(name, hasPrefix ? colon : 0, m_arena->Copy(value));
 }
 
 ElementNode *ElementNode::AppendElement(std::string_view prefix, std::string_view localName) {
@@ -225,13 +223,12 @@ void ElementNode::SetName(std::string_view name) noexcept {
   m_prefixLength = colon == std::string_view::npos ? 0 : static_cast<std::uint32_t>(colon);
 }
 
-void ElementNode::AppendAttribute(std::string_view name, std::string_view value) {
+void ElementNode::AppendAttribute(std::string_view name, std::size_t prefixLength, std::string_view value) {
   Attribute *const attribute = m_arena->New<Attribute>();
-  const std::size_t colon = name.find(':');
   attribute->m_name = name;
   attribute->m_value = value;
-  attribute->m_prefixLength = colon == std::string_view::npos ? 0 : static_cast<std::uint32_t>(colon);
-  attribute->m_isNamespaceDeclaration = (colon == std::string_view::npos ? name : name.substr(0, colon)) == "xmlns";
+  attribute->m_prefixLength = static_cast<std::uint32_t>(prefixLength);
+  attribute->m_isNamespaceDeclaration = (prefixLength ? name.substr(0, prefixLength) : name) == "xmlns";
   (m_lastAttribute ? m_lastAttribute->m_next : m_firstAttribute) = attribute;
   m_lastAttribute = attribute;
   if (attribute->m_isNamespaceDeclaration) {

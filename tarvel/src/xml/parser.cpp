@@ -2,8 +2,7 @@
 
 #include <tarvel/xml/parser.h>
 
-#include "xml/sax_session.h"
-#include "xml/source_checks.h"
+#include "xml/document_reader.h"
 #include "xml/tree_builder.h"
 
 #include <tarvel/core/secure_wipe.h>
@@ -22,7 +21,7 @@ class SourceText final : public Object {
 public:
   explicit SourceText(std::string &&text) noexcept : m_text(std::move(text)) {}
   ~SourceText() override { SecureWipe(m_text); }
-  std::string_view Get() const noexcept { return m_text; } // a null byte follows
+  std::string_view Get() const noexcept { return m_text; }
 
 private:
   std::string m_text;
@@ -34,9 +33,8 @@ public:
 
   Ref<Object> Parse(Reader &reader) override {
     const Ref<SourceText> source = MakeRef<SourceText>(reader.ReadToEnd(MAX_DOCUMENT_BYTES));
-    CheckSource(source->Get());
     m_handler->StartDocument(source->Get(), source);
-    SaxSession(source->Get(), *m_handler).Run();
+    ReadDocument(source->Get(), *m_handler);
     return m_handler->TakeResult();
   }
 

@@ -7,7 +7,7 @@
 #include <tarvel/xml/node.h>
 #include <tarvel/xml/parser.h>
 
-#include <string>
+#include <string_view>
 
 namespace Tarvel {
 namespace Xml {
@@ -27,16 +27,11 @@ public:
 private:
   bool IsInSource(std::string_view text) const noexcept;
   std::string_view Store(std::string_view text);
-  void EndText();
 
   Ref<DocumentNode> m_document;
   NodeArena *m_arena = nullptr; // the document node's
   Node *m_current = nullptr;    // the open element, or the document
   std::string_view m_source;
-
-  // Character data that no other event has ended yet: one piece of the source, or pieces gathered in the buffer.
-  std::string_view m_text;
-  std::string m_gathered;
 };
 
 } // namespace Xml

@@ -1,7 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
-// A completion must be called however early memory runs out. This program replaces the allocation functions of C++, and
-// lets each allocation of an exchange fail in its turn. All of it runs on the test's thread, in one order.
-#include "support/refused_memory.h"
+// A completion must be called however early memory runs out: each allocation of an exchange fails in its turn. All of it
+// runs on the test's thread, in one order.
+#include "integration/out_of_memory/failing_heap.h"
 #include "transport/https_session.h"
 
 #include <tarvel/core/exception.h>
@@ -18,25 +18,6 @@
 #include <utility>
 #include <vector>
 
-namespace {
-
-constexpr long NEVER = std::numeric_limits<long>::max();
-
-thread_local long t_allocationsLeft = NEVER; // before the one that fails
-thread_local bool t_failsOnce = false;       // otherwise all that follow fail, too
-thread_local bool t_hasFailed = false;
-
-} // namespace
-
-bool Testing::IsMemoryRefused() noexcept {
-  if (t_allocationsLeft == NEVER || t_allocationsLeft-- > 0) {
-    return false;
-  }
-  t_allocationsLeft = t_failsOnce ? NEVER : 0;
-  t_hasFailed = true;
-  return true;
-}
-
 namespace SsoClient {
 namespace {
 
@@ -45,6 +26,10 @@ using Tarvel::Ref;
 using Tarvel::Http::ConnectionSpec;
 using Tarvel::System::ScheduledItem;
 using Tarvel::System::Stream;
+using Testing::FailingHeap;
+using Testing::Shortage;
+
+constexpr long NEVER = std::numeric_limits<long>::max();
 
 const char ANSWER[] = "HTTP/1.1 200 OK\r\nSet-Cookie: name=value-that-is-too-long-for-the-string-itself\r\n"
                       "Transfer-Encoding: chunked\r\n\r\n20\r\n0123456789012345678901234567890\n\r\n0\r\n\r\n";
@@ -116,11 +101,12 @@ private:
 struct Outcome {
   int calls = 0;
   bool succeeded = false;
+  bool hasFailed = false;      // an allocation
   bool ranOutOfMemory = false; // by the class, or by the text, for which there may be memory again
 };
 
 /// Asks with so many allocations that go well; -1 calls when the start itself failed.
-Outcome AskWith(long allocations, const char *answer, const Exception *connectFailure) {
+Outcome AskWith(long allocations, Shortage shortage, const char *answer, const Exception *connectFailure) {
   const Tarvel::System::NetworkException closed("closed");
   const auto stream = Tarvel::MakeRef<ScriptedStream>(answer);
   const auto spec = Tarvel::MakeRef<ScriptedSpec>(stream);
@@ -136,36 +122,36 @@ Outcome AskWith(long allocations, const char *answer, const Exception *connectFa
                              (failure && std::strcmp(failure->what(), "There is not enough memory") == 0);
   };
   Ref<ScheduledItem> item;
-  t_hasFailed = false;
-  t_allocationsLeft = allocations;
+  FailingHeap heap(allocations, shortage);
   try {
     session.SendRequestAsync(request, completion, item);
     spec->Connect(connectFailure);
     while (stream->Advance(closed)) {
     }
   } catch (const std::bad_alloc &) {
-    t_allocationsLeft = NEVER;
+    heap.End();
     EXPECT_EQ(outcome.calls, 0);
     EXPECT_FALSE(item) << "what was started let an exception out";
     spec->Connect(connectFailure);
     outcome.calls = outcome.calls == 0 ? -1 : outcome.calls;
   }
-  t_allocationsLeft = NEVER;
+  heap.End();
+  outcome.hasFailed = heap.HasFailed();
   return outcome;
 }
 
 /// Lets memory run out ever later, until it lasts.
-void ExpectOneCallWhereverMemoryRunsOut(bool once, const char *answer, const Exception *connectFailure, bool succeeds) {
-  AskWith(NEVER, answer, connectFailure); // what is made once is made
-  t_failsOnce = once;
+void ExpectOneCallWhereverMemoryRunsOut(Shortage shortage, const char *answer, const Exception *connectFailure,
+                                        bool succeeds) {
+  AskWith(NEVER, shortage, answer, connectFailure); // what is made once is made
   bool started = false;
   for (long allocations = 0;; ++allocations) {
     SCOPED_TRACE(allocations);
     ASSERT_LT(allocations, 10000);
-    const Outcome outcome = AskWith(allocations, answer, connectFailure);
+    const Outcome outcome = AskWith(allocations, shortage, answer, connectFailure);
     ASSERT_TRUE(outcome.calls == 1 || (!started && outcome.calls == -1)) << outcome.calls;
     started = outcome.calls == 1;
-    if (!t_hasFailed) {
+    if (!outcome.hasFailed) {
       EXPECT_EQ(outcome.succeeded, succeeds);
       EXPECT_FALSE(outcome.ranOutOfMemory);
       EXPECT_GT(allocations, 10);
@@ -175,8 +161,7 @@ void ExpectOneCallWhereverMemoryRunsOut(bool once, const char *answer, const Exc
   }
 }
 
-/// Whether one allocation alone fails.
-class SendRequestAsync : public testing::TestWithParam<bool> {};
+class SendRequestAsync : public testing::TestWithParam<Shortage> {};
 
 TEST_P(SendRequestAsync, CallsItsCompletionOnceWhereverMemoryRunsOut) {
   ExpectOneCallWhereverMemoryRunsOut(GetParam(), ANSWER, nullptr, true);
@@ -195,8 +180,10 @@ TEST_P(SendRequestAsync, CallsItsCompletionOnceWhereverMemoryRunsOutOverAFailedC
   ExpectOneCallWhereverMemoryRunsOut(GetParam(), ANSWER, &failure, false);
 }
 
-INSTANTIATE_TEST_SUITE_P(Failures, SendRequestAsync, testing::Bool(),
-                         [](const auto &once) { return once.param ? "One" : "AllThatFollow"; });
+INSTANTIATE_TEST_SUITE_P(Failures, SendRequestAsync, testing::Values(Shortage::ONCE, Shortage::FROM_THEN),
+                         [](const auto &shortage) {
+                           return shortage.param == Shortage::ONCE ? "One" : "AllThatFollow";
+                         });
 
 } // namespace
 } // namespace SsoClient

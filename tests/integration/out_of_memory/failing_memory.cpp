@@ -4,9 +4,7 @@
 #include <atomic>
 #include <cerrno>
 #include <cstdlib>
-#include <cstring>
 
-#include <libxml/xmlmemory.h>
 #include <openssl/crypto.h>
 
 namespace Testing {
@@ -52,12 +50,6 @@ void Free(void *memory) noexcept {
   std::free(memory);
 }
 
-char *Duplicate(const char *text) noexcept {
-  const std::size_t bytes = std::strlen(text) + 1;
-  void *const copy = Allocate(bytes);
-  return static_cast<char *>(copy ? std::memcpy(copy, text, bytes) : nullptr);
-}
-
 void *AllocateForOpenSsl(std::size_t bytes, const char *, int) {
   return Allocate(bytes);
 }
@@ -72,8 +64,7 @@ void FreeForOpenSsl(void *memory, const char *, int) {
   Free(memory);
 }
 
-const bool IS_INSTALLED = CRYPTO_set_mem_functions(AllocateForOpenSsl, ReallocateForOpenSsl, FreeForOpenSsl) == 1 &&
-                          xmlMemSetup(Free, Allocate, Reallocate, Duplicate) == 0;
+const bool IS_INSTALLED = CRYPTO_set_mem_functions(AllocateForOpenSsl, ReallocateForOpenSsl, FreeForOpenSsl) == 1;
 
 } // namespace
 

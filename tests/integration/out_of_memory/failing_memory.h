@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// Memory for OpenSSL and libxml2 that runs out when a test says so.
+/// Memory for OpenSSL that runs out when a test says so.
 
 #pragma once
 
@@ -23,7 +23,7 @@ public:
   bool HasFailed() const noexcept;
 };
 
-/// Allocations of OpenSSL and libxml2 that have not been given back.
+/// Allocations of OpenSSL that have not been given back.
 long CountForeignAllocations();
 
 } // namespace Testing

@@ -1,5 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
-// Whatever allocation of OpenSSL or libxml2 fails: an operation succeeds all the same, or says that there is no memory. It
+// Whatever allocation of OpenSSL fails: an operation succeeds all the same, or says that there is no memory. It
 // never answers, or reports a fault of what it was given.
 #include "integration/out_of_memory/failing_memory.h"
 #include "support/completion.h"
@@ -12,9 +12,7 @@
 #include <tarvel/crypto/certificate.h>
 #include <tarvel/crypto/private_key.h>
 #include <tarvel/ssl/ssl_context.h>
-#include <tarvel/xml/document.h>
 #include <tarvel/xml/node.h>
-#include <tarvel/xml/parser.h>
 #include <tarvel/xml/security/canonicalizer.h>
 #include <tarvel/xml/security/signature.h>
 
@@ -239,16 +237,6 @@ TEST_F(OutOfMemory, IsReportedByHandshakesReadsAndWrites) {
   ASSERT_TRUE(Testing::DrainIoThreads());
   context.reset(); // and the sessions that it keeps
   EXPECT_LE(Testing::CountForeignAllocations() - before, 64);
-}
-
-TEST_F(OutOfMemory, IsReportedByTheParser) {
-  const std::string xml = Token("full");
-  testing::internal::CaptureStderr();
-  ExpectNothingElse([&xml] {
-    const Ref<Tarvel::Reader> reader = Tarvel::CreateStringReader(xml);
-    Tarvel::Xml::CreateXMLParser(Tarvel::Xml::CreateXMLDocumentHandler())->Parse(*reader);
-  });
-  EXPECT_EQ(testing::internal::GetCapturedStderr(), "");
 }
 
 } // namespace

@@ -32,17 +32,17 @@ inline const WrongAnswer TO_ALL[] = {
     {"bad-content-length",
      "CommunicationException: Bad response from %e: its header is not HTTP/1.x (bad Content-Length)"},
     {"garbage", "CommunicationException: Bad response from %e: its header is not HTTP/1.x (bad version)"},
-    {"bad-status-200", "SsoException: Response is not well-formed XML: Start tag expected, '<' not found at line #, "
-                       "column #"},
-    {"bad-status-500", "SsoException: Response is not well-formed XML: Start tag expected, '<' not found at line #, "
-                       "column #"},
-    {"garbled-xml", "SsoException: Response is not well-formed XML: Opening and ending tag mismatch: Envelope line 1 "
-                    "and garbled at line #, column #"},
+    {"bad-status-200", "SsoException: Response is not well-formed XML: text comes before the document element at "
+                       "line #, column #"},
+    {"bad-status-500", "SsoException: Response is not well-formed XML: text comes before the document element at "
+                       "line #, column #"},
+    {"garbled-xml", "SsoException: Response is not well-formed XML: the element 'soapenv:Envelope' of line 1 has "
+                    "another end tag at line #, column #"},
     {"doctype", "SsoException: Response is not well-formed XML: a document type declaration is not accepted at line "
                 "#, column #"},
     {"too-deep",
      "SsoException: Response is not well-formed XML: elements are nested deeper than 256 at line #, column #"},
-    {"empty-body", "SsoException: Response is not well-formed XML: Document is empty at line #, column #"},
+    {"empty-body", "SsoException: Response is not well-formed XML: the document is empty at line #, column #"},
     {"not-soap", "SsoException: Unexpected response format: missing SAOP Body."},
     {"wrong-root", "SsoException: Unexpected response format: missing SAOP Body."},
     {"no-token", "SsoException: Unexpected XML format"},

@@ -2,6 +2,7 @@
 // Documents that are large in one dimension: refused at a documented limit, or read at a cost that grows with their length
 // and no faster. Cost is counted in octets allocated, which no load on the machine can change.
 
+#include "heap_octets.h"
 #include "outcome.h"
 #include "support/data_file.h"
 #include "support/work_folder.h"
@@ -12,42 +13,7 @@
 
 #include <cstddef>
 #include <cstdlib>
-#include <new>
 #include <string>
-
-namespace {
-
-std::size_t g_allocatedOctets = 0; // the tests of this program run on one thread
-
-void *Allocate(std::size_t size) {
-  g_allocatedOctets += size;
-  void *const memory = std::malloc(size ? size : 1);
-  if (!memory) {
-    throw std::bad_alloc();
-  }
-  return memory;
-}
-
-} // namespace
-
-void *operator new(std::size_t size) {
-  return Allocate(size);
-}
-void *operator new[](std::size_t size) {
-  return Allocate(size);
-}
-void operator delete(void *memory) noexcept {
-  std::free(memory);
-}
-void operator delete[](void *memory) noexcept {
-  std::free(memory);
-}
-void operator delete(void *memory, std::size_t) noexcept {
-  std::free(memory);
-}
-void operator delete[](void *memory, std::size_t) noexcept {
-  std::free(memory);
-}
 
 namespace Attacks {
 namespace {
@@ -78,9 +44,9 @@ struct Counted {
 };
 
 Counted CountToken(const std::string &xml) {
-  const std::size_t before = g_allocatedOctets;
+  const HeapCount heap;
   Outcome outcome = TryToken(xml);
-  return {std::move(outcome), g_allocatedOctets - before};
+  return {std::move(outcome), heap.GetAllocated()};
 }
 
 /// The bearer token with `text` in its subject's name. It then fails at the signature, after everything else has been

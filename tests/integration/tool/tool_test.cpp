@@ -275,7 +275,7 @@ const Refusal REFUSALS[] = {
      5,
      "XMLParseException",
      "token invalid",
-     "Start tag expected, '<' not found at line 1, column 1"},
+     "text comes before the document element at line 1, column 1"},
     {"TokenThatIsAnotherDocument",
      {"--trust", "sts-rsa.crt", "../attacks/other-root.xml"},
      5,

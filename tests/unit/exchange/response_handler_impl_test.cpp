@@ -86,10 +86,10 @@ protected:
 
 TEST_P(EachResponse, IsRefusedWithTheParsersMessageWhenItIsNotXml) {
   EXPECT_THROWS_MESSAGE(Handle("<a><b></a>"), SsoException,
-                        "Response is not well-formed XML: Opening and ending tag mismatch: b line 1 and a at line 1, "
-                        "column 11");
+                        "Response is not well-formed XML: the element 'b' of line 1 has another end tag at line 1, "
+                        "column 7");
   EXPECT_THROWS_MESSAGE(Handle(""), SsoException,
-                        "Response is not well-formed XML: Document is empty at line 1, column 1");
+                        "Response is not well-formed XML: the document is empty at line 1, column 1");
   EXPECT_THROWS_MESSAGE(
       Handle("<!DOCTYPE a><a/>"), SsoException,
       "Response is not well-formed XML: a document type declaration is not accepted at line 1, column 1");

@@ -3,9 +3,13 @@
 #include "crypto/digest.h"
 
 #include <gtest/gtest.h>
+#include <openssl/err.h>
 
 #include <array>
+#include <atomic>
 #include <string>
+#include <thread>
+#include <vector>
 
 namespace Tarvel::Crypto {
 
@@ -44,6 +48,56 @@ TEST(Digest, OfNothing) {
 
 TEST(Digest, DoesNotDependOnThePieces) {
   EXPECT_EQ(DigestInHex(DigestAlgorithm::SHA256, {"a", "", "bc"}), DigestInHex(DigestAlgorithm::SHA256, {"abc"}));
+}
+
+constexpr const char *SHA256_OF_ABC = "ba7816bf8f01cfea414140de5dae2223b00361a396177a9cb410ff61f20015ad";
+
+TEST(Digest, DoesNotDependOnAnEarlierOneThatWasFinished) {
+  DigestInHex(DigestAlgorithm::SHA256, {std::string(200, 'x')});
+  EXPECT_EQ(DigestInHex(DigestAlgorithm::SHA256, {"abc"}), SHA256_OF_ABC);
+}
+
+TEST(Digest, DoesNotDependOnAnEarlierOneThatWasGivenUp) {
+  {
+    Digest digest(DigestAlgorithm::SHA256);
+    digest.Update("x");
+  }
+  EXPECT_EQ(DigestInHex(DigestAlgorithm::SHA256, {"abc"}), SHA256_OF_ABC);
+}
+
+TEST(Digest, DoesNotDependOnAnotherThatIsUnderWay) {
+  Digest outer(DigestAlgorithm::SHA256);
+  outer.Update("a");
+  EXPECT_EQ(DigestInHex(DigestAlgorithm::SHA256, {"abc"}), SHA256_OF_ABC);
+  outer.Update("bc");
+  std::array<std::uint8_t, MAX_DIGEST_BYTES> value{};
+  outer.Finish(value.data());
+  EXPECT_EQ(value[0], 0xba);
+  EXPECT_EQ(value[31], 0xad);
+}
+
+TEST(Digest, IsRightOnManyThreads) {
+  std::atomic<int> wrong{0};
+  std::vector<std::thread> threads;
+  for (int thread = 0; thread < 8; ++thread) {
+    threads.emplace_back([&wrong] {
+      for (int round = 0; round < 200; ++round) {
+        wrong += DigestInHex(DigestAlgorithm::SHA256, {"a", "bc"}) == SHA256_OF_ABC ? 0 : 1;
+      }
+    });
+  }
+  for (std::thread &thread : threads) {
+    thread.join();
+  }
+  EXPECT_EQ(wrong, 0);
+}
+
+TEST(Digest, KeepsTheErrorsOfTheHost) {
+  ERR_clear_error();
+  ERR_raise(ERR_LIB_USER, 7);
+  DigestInHex(DigestAlgorithm::SHA256, {"abc"});
+  EXPECT_EQ(ERR_GET_REASON(ERR_get_error()), 7);
+  EXPECT_EQ(ERR_get_error(), 0U);
 }
 
 } // namespace

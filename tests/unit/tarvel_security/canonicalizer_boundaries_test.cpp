@@ -118,6 +118,61 @@ TEST(CanonicalizeBoundaries, EscapesEachCharacterOfANamespaceNameThatHasAnEscape
   EXPECT_EQ("<p:r xmlns:p=\"urn:&amp;&lt;>&quot;'&#x9;&#xA;&#xD;\"></p:r>", CanonicalForm(*element, Uri::EXCLUSIVE));
 }
 
+/// An element with `before` plain characters, `character` and `after` plain ones for its text and its attribute.
+Tarvel::Ref<Tarvel::Xml::ElementNode> ElementWith(std::size_t before, char character, std::size_t after) {
+  const std::string value = std::string(before, 'x') + character + std::string(after, 'y');
+  Tarvel::Ref<Tarvel::Xml::ElementNode> element;
+  Tarvel::Xml::CreateElementNode("", "r", element);
+  element->DefineAttribute("a", value);
+  Tarvel::Ref<Tarvel::Xml::TextNode> text;
+  Tarvel::Xml::CreateTextNode(text);
+  text->SetValue(value);
+  element->AppendChild(text.get());
+  return element;
+}
+
+struct EscapedCharacter {
+  char character;
+  const char *inText;
+  const char *inAttribute;
+};
+
+// Octets are looked at in blocks of 16; so every place of two blocks and of what is left is tried.
+TEST(CanonicalizeBoundaries, EscapesACharacterAtEveryPlaceOfAValue) {
+  constexpr std::size_t LONGEST = 36;
+  for (const EscapedCharacter &escaped :
+       {EscapedCharacter{'&', "&amp;", "&amp;"}, EscapedCharacter{'<', "&lt;", "&lt;"},
+        EscapedCharacter{'>', "&gt;", ">"}, EscapedCharacter{'"', "\"", "&quot;"},
+        EscapedCharacter{'\t', "\t", "&#x9;"}, EscapedCharacter{'\n', "\n", "&#xA;"},
+        EscapedCharacter{'\r', "&#xD;", "&#xD;"}, EscapedCharacter{'\'', "'", "'"}}) {
+    for (std::size_t before = 0; before < LONGEST; ++before) {
+      for (std::size_t after = 0; before + after < LONGEST; ++after) {
+        const std::string x(before, 'x');
+        const std::string y(after, 'y');
+        ASSERT_EQ("<r a=\"" + x + escaped.inAttribute + y + "\">" + x + escaped.inText + y + "</r>",
+                  CanonicalForm(*ElementWith(before, escaped.character, after), Uri::EXCLUSIVE));
+      }
+    }
+  }
+}
+
+TEST(CanonicalizeBoundaries, EscapesEachOfManyCharactersInOneValue) {
+  const std::string value(40, '<');
+  std::string escaped;
+  for (std::size_t i = 0; i < value.size(); ++i) {
+    escaped += "&lt;";
+  }
+  const auto element = ElementWith(0, 'x', 0);
+  element->DefineAttribute("a", value);
+  EXPECT_EQ("<r a=\"" + escaped + "\">x</r>", CanonicalForm(*element, Uri::EXCLUSIVE));
+}
+
+TEST(CanonicalizeBoundaries, FindsAPrefixAnewWhereItsMeaningChanges) {
+  const std::string document = "<a:r xmlns:a=\"urn:1\"><a:e xmlns:a=\"urn:2\"><a:f></a:f></a:e><a:g></a:g></a:r>";
+  EXPECT_EQ(document, CanonicalDocument(document, Uri::EXCLUSIVE));
+  EXPECT_EQ(document, CanonicalDocument(document, Uri::INCLUSIVE));
+}
+
 TEST(CanonicalizeBoundaries, KeepsDataOfOneCharacterInAProcessingInstruction) {
   EXPECT_EQ("<?a b?>\n<r><?c d?><?e f g?><?h?></r>\n<?i j?>",
             CanonicalDocument("<?a b?><r><?c   d?><?e f g?><?h ?></r><?i\nj?>", Uri::INCLUSIVE));

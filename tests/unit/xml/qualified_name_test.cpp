@@ -22,6 +22,18 @@ TEST(LocalName, IsInNoNamespace) {
   EXPECT_EQ(QName("", "Count"), LocalName("Count"));
 }
 
+TEST(QNameView, IsEqualWhenBothTextsAre) {
+  const QName name("urn:a", "b");
+  EXPECT_EQ(QNameView(name), QNameView("urn:a", "b"));
+  EXPECT_NE(QNameView(name), QNameView("urn:c", "b"));
+  EXPECT_NE(QNameView(name), QNameView("urn:a", "c"));
+}
+
+TEST(QNameView, HasTheTextOfTheName) {
+  EXPECT_EQ("{urn:a}b", QNameView("urn:a", "b").ToString());
+  EXPECT_EQ("b", LocalName("b").ToString());
+}
+
 TEST(ResolveQName, TakesThePrefixInScope) {
   const ParsedDocument document("<r xmlns:a='urn:outer' xmlns:b='urn:b'><e xmlns:a='urn:inner'/></r>");
   QName name;

@@ -99,9 +99,9 @@ class TARVEL_API DateTimeFormatException : public Exception {
   TARVEL_EXCEPTION_BODY(DateTimeFormatException, Exception);
 };
 
-/// Memory that ran out, in any function that uses OpenSSL or libxml2, or after the start of an operation over HTTP or TLS,
-/// whose completion gets it. (Any other call raises `std::bad_alloc`.) It says nothing about what was being read, verified
-/// or sent. The message is always "There is not enough memory"; there is no call stack.
+/// Memory that ran out in OpenSSL, in any function that uses it, or after the start of an operation over HTTP or TLS, whose
+/// completion gets it. (Elsewhere a call raises `std::bad_alloc`.) It says nothing about what was being read, verified or
+/// sent. The message is always "There is not enough memory"; there is no call stack.
 class TARVEL_API OutOfMemoryException : public Exception {
 public:
   OutOfMemoryException() noexcept = default;

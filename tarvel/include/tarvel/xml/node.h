@@ -226,7 +226,7 @@ private:
 
   // Both take views that live as long as the arena.
   void SetName(std::string_view name) noexcept;
-  void AppendAttribute(std::string_view name, std::string_view value);
+  void AppendAttribute(std::string_view name, std::size_t prefixLength, std::string_view value);
 
   std::string_view m_name;
   Attribute *m_firstAttribute = nullptr;

@@ -19,8 +19,8 @@ namespace Tarvel {
 namespace Xml {
 
 /// A document that is not well-formed (XML 1.0, Namespaces in XML 1.0), or that has what this platform refuses: a document
-/// type declaration, an encoding other than UTF-8, more than one of the limits below, or long names with unbound
-/// prefixes in such number that looking at them all would take too long. The message ends in " at line L, column C".
+/// type declaration, an XML version other than 1.0, an encoding other than UTF-8, or more than one of the limits below.
+/// The message ends in " at line L, column C".
 class TARVEL_API XMLParseException : public Exception {
 public:
   XMLParseException(const std::string &detail, std::uint32_t line, std::uint32_t column);
@@ -42,6 +42,8 @@ constexpr std::size_t MAX_DOCUMENT_BYTES = 16u * 1024 * 1024; ///< a longer docu
 constexpr unsigned MAX_ELEMENT_DEPTH = 256;                   ///< the document element has depth 1
 constexpr unsigned MAX_ATTRIBUTES = 256;                      ///< of one element, namespace declarations included
 constexpr unsigned MAX_NAMESPACES_IN_SCOPE = 256;             ///< declarations in force at one element
+constexpr std::size_t MAX_NODES = 1024 * 1024;                ///< of one document: nodes and attributes
+constexpr std::size_t MAX_NAME_BYTES = 4096;                  ///< of an element, attribute or target, prefix included
 
 /// Receives a document as it is parsed. The platform's one handler is the document handler.
 class XMLHandler;
@@ -51,7 +53,8 @@ class TARVEL_API XMLParser : public Object {
 public:
   /// Reads `reader` to its end and returns what the handler made of the document.
   /// @throws XMLParseException as that class says; the handler then yields nothing.
-  /// @throws IOException when the reader fails. @throws OutOfMemoryException, which says nothing about the document.
+  /// @throws IOException when the reader fails. @throws std::bad_alloc when memory runs out, which says nothing about the
+  ///         document.
   virtual Ref<Object> Parse(Reader &reader) = 0;
 
 protected:
@@ -66,11 +69,16 @@ TARVEL_API Ref<XMLParser> CreateXMLParser(const Ref<XMLHandler> &handler);
 
 /// One attribute of a start tag; the views are valid during the call.
 struct AttributeEvent {
-  std::string_view name; ///< as written, prefix included; "xmlns" and "xmlns:p" for declarations
-  std::string_view value;
+  std::string_view name;        ///< as written, prefix included; "xmlns" and "xmlns:p" for declarations
+  std::string_view value;       ///< normalised: references and white space replaced (XML 1.0, section 3.3.3)
+  std::size_t prefixLength = 0; ///< of the name's prefix, 0 without one
+
+  std::string_view GetPrefix() const noexcept { return name.substr(0, prefixLength); }
+  std::string_view GetLocalName() const noexcept { return prefixLength ? name.substr(prefixLength + 1) : name; }
+  bool IsNamespaceDeclaration() const noexcept { return (prefixLength ? GetPrefix() : name) == "xmlns"; }
 };
 
-/// Its functions run within the parse, for whose end `fork` waits: they must not wait for a thread that forks.
+/// What receives the events of a document. An exception that leaves a function ends the parse and reaches its caller.
 class TARVEL_API XMLHandler : public Object {
 public:
   /// A document begins. `source` is its text; it stays where it is, and alive, as long as somebody holds `owner`, so that
@@ -79,7 +87,7 @@ public:
   virtual void StartElement(std::string_view name, const AttributeEvent *attributes, std::size_t count,
                             std::uint32_t line, std::uint32_t column) = 0;
   virtual void EndElement() = 0;
-  /// A piece of character data or of a CDATA section; adjacent ones belong together.
+  /// Character data up to the next other event, CDATA sections included; never empty.
   virtual void Characters(std::string_view text) = 0;
   virtual void Comment(std::string_view text) = 0;
   virtual void ProcessingInstruction(std::string_view target, std::string_view data) = 0;

@@ -22,6 +22,9 @@ namespace {
 // Attributes are sorted by namespace name, so a long one would be compared again and again.
 constexpr std::size_t MAX_NAMESPACE_NAME_BYTES = 4096;
 
+constexpr std::size_t EXPECTED_DEPTH = 16;
+constexpr std::size_t EXPECTED_ATTRIBUTES = 8; // of one element
+
 constexpr std::string_view XML_NAMESPACE = "http://www.w3.org/XML/1998/namespace";
 constexpr std::string_view INCLUSIVE_WITH_LONE_NUMBER_SIGN = "http://www.w3.org/TR/2001/REC-xml-c14n-20010315#";
 
@@ -44,6 +47,10 @@ bool HasScheme(std::string_view uri) {
 
 [[noreturn]] void Refuse(const std::string &what, const ElementNode &element) {
   throw XmlSecurityException("No canonical form: " + what + PlaceOf(element));
+}
+
+[[noreturn]] void RefuseUnbound(std::string_view prefix, const ElementNode &element) {
+  Refuse("the prefix \"" + StringUtil::Shorten(prefix) + "\" is not bound", element);
 }
 
 /// The prefix that a namespace declaration binds; empty for the default namespace.
@@ -74,7 +81,8 @@ struct CanonicalAttribute {
   std::size_t height; // 0 for the element's own, else how far above it the attribute stands
 
   bool operator<(const CanonicalAttribute &other) const {
-    return std::tie(namespaceUri, localName, height) < std::tie(other.namespaceUri, other.localName, other.height);
+    return std::tie(namespaceUri, localName, height) <=> std::tie(other.namespaceUri, other.localName, other.height) <
+           0;
   }
   bool HasNameOf(const CanonicalAttribute &other) const {
     return localName == other.localName && namespaceUri == other.namespaceUri;
@@ -85,7 +93,11 @@ struct CanonicalAttribute {
 class CanonicalWalk {
 public:
   CanonicalWalk(const Node &apex, const CanonicalMethod &method, const Node *omitted, Writer &writer)
-      : m_apex(apex), m_method(method), m_omitted(omitted), m_output(writer) {}
+      : m_apex(apex), m_method(method), m_omitted(omitted), m_output(writer) {
+    m_openElements.reserve(EXPECTED_DEPTH);
+    m_declarations.reserve(EXPECTED_ATTRIBUTES);
+    m_attributes.reserve(EXPECTED_ATTRIBUTES);
+  }
 
   void Write();
 
@@ -105,7 +117,13 @@ private:
   void WriteProcessingInstruction(const ProcessingInstructionNode &instruction);
   void WriteOutsideDocumentElement(const Node &node, bool before);
 
-  std::size_t FindPrefix(std::string_view prefix, const ElementNode &element) const;
+  std::size_t FindPrefix(std::string_view prefix, const ElementNode &element) {
+    const std::size_t binding = m_bindings.Find(prefix);
+    if (binding == NamespaceBindings::NOT_BOUND) {
+      RefuseUnbound(prefix, element);
+    }
+    return binding;
+  }
   bool IsInclusivePrefix(std::string_view prefix) const;
   void NeedNamespace(std::size_t binding) {
     if (m_bindings.Write(binding)) {
@@ -192,9 +210,7 @@ void CanonicalWalk::Close(const Node &node) {
   if (!element) {
     return;
   }
-  m_output.Put("</");
-  m_output.Put(element->GetName());
-  m_output.Put('>');
+  m_output.Put("</", element->GetName(), ">");
   m_bindings.GoBack(m_openElements.back());
   m_openElements.pop_back();
   m_documentElementWritten = m_openElements.empty();
@@ -204,14 +220,19 @@ void CanonicalWalk::OpenElement(const ElementNode &element) {
   m_openElements.push_back(m_bindings.GetMark());
   m_declarations.clear();
   m_attributes.clear();
-  Declare(element);
+  if (element.GetFirstAttribute()) {
+    Declare(element);
+  }
   GatherNamespaces(element);
   GatherAttributes(element);
-  m_output.Put('<');
-  m_output.Put(element.GetName());
+  if (m_declarations.empty() && m_attributes.empty()) {
+    m_output.Put("<", element.GetName(), ">");
+    return;
+  }
+  m_output.Put("<", element.GetName());
   WriteNamespaces();
   WriteAttributes(element);
-  m_output.Put('>');
+  m_output.Put(">");
 }
 
 void CanonicalWalk::GatherNamespaces(const ElementNode &element) {
@@ -274,11 +295,9 @@ void CanonicalWalk::WriteNamespaces() {
             [this](std::size_t left, std::size_t right) { return m_bindings[left].prefix < m_bindings[right].prefix; });
   for (const std::size_t index : m_declarations) {
     const NamespaceBindings::Binding &binding = m_bindings[index];
-    m_output.Put(binding.prefix.empty() ? " xmlns" : " xmlns:");
-    m_output.Put(binding.prefix);
-    m_output.Put("=\"");
+    m_output.Put(binding.prefix.empty() ? " xmlns" : " xmlns:", binding.prefix, "=\"");
     m_output.PutAttributeValue(binding.uri);
-    m_output.Put('"');
+    m_output.Put("\"");
   }
 }
 
@@ -293,11 +312,9 @@ void CanonicalWalk::WriteAttributes(const ElementNode &element) {
       continue; // a nearer one overrides it
     }
     previous = &attribute;
-    m_output.Put(' ');
-    m_output.Put(attribute.attribute->GetName());
-    m_output.Put("=\"");
+    m_output.Put(" ", attribute.attribute->GetName(), "=\"");
     m_output.PutAttributeValue(attribute.attribute->GetValue());
-    m_output.Put('"');
+    m_output.Put("\"");
   }
 }
 
@@ -306,19 +323,15 @@ void CanonicalWalk::WriteComment(const CommentNode &comment) {
     return;
   }
   WriteOutsideDocumentElement(comment, true);
-  m_output.Put("<!--");
-  m_output.Put(comment.GetValue());
-  m_output.Put("-->");
+  m_output.Put("<!--", comment.GetValue(), "-->");
   WriteOutsideDocumentElement(comment, false);
 }
 
 void CanonicalWalk::WriteProcessingInstruction(const ProcessingInstructionNode &instruction) {
   WriteOutsideDocumentElement(instruction, true);
-  m_output.Put("<?");
-  m_output.Put(instruction.GetTarget());
+  m_output.Put("<?", instruction.GetTarget());
   if (!instruction.GetData().empty()) {
-    m_output.Put(' ');
-    m_output.Put(instruction.GetData());
+    m_output.Put(" ", instruction.GetData());
   }
   m_output.Put("?>");
   WriteOutsideDocumentElement(instruction, false);
@@ -328,16 +341,8 @@ void CanonicalWalk::WriteProcessingInstruction(const ProcessingInstructionNode &
 void CanonicalWalk::WriteOutsideDocumentElement(const Node &node, bool before) {
   const Node *parent = node.GetParent();
   if (parent && parent->GetKind() == NodeKind::DOCUMENT && before == m_documentElementWritten) {
-    m_output.Put('\n');
+    m_output.Put("\n");
   }
-}
-
-std::size_t CanonicalWalk::FindPrefix(std::string_view prefix, const ElementNode &element) const {
-  const std::size_t binding = m_bindings.Find(prefix);
-  if (binding == NamespaceBindings::NOT_BOUND) {
-    Refuse("the prefix \"" + StringUtil::Shorten(prefix) + "\" is not bound", element);
-  }
-  return binding;
 }
 
 bool CanonicalWalk::IsInclusivePrefix(std::string_view prefix) const {

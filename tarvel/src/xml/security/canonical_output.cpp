@@ -7,6 +7,7 @@
 
 #include <array>
 #include <cstdint>
+#include <cstring>
 
 namespace Tarvel::Xml::Security {
 
@@ -49,18 +50,58 @@ std::string_view Escape(char character) {
   }
 }
 
+// Most of a message needs no escape, so that is found out for many octets at once.
+using Block = unsigned char __attribute__((vector_size(16)));
+constexpr std::size_t BLOCK_BYTES = sizeof(Block);
+
+/// Whether one of the `BLOCK_BYTES` octets at `octets` is escaped at that place.
+template <Place PLACE>
+bool HasEscaped(const char *octets) {
+  Block block;
+  std::memcpy(&block, octets, BLOCK_BYTES);
+  auto found = (block == '&') | (block == '<') | (block == '\r');
+  if constexpr (PLACE == IN_TEXT) {
+    found |= block == '>';
+  } else {
+    found |= (block == '"') | (block == '\t') | (block == '\n');
+  }
+  std::array<std::uint64_t, 2> halves;
+  static_assert(sizeof(halves) == BLOCK_BYTES);
+  std::memcpy(&halves, &found, BLOCK_BYTES);
+  return (halves[0] | halves[1]) != 0;
+}
+
+/// The first octet from `from` to `end` that is escaped at that place, or `end`.
+template <Place PLACE>
+const char *FindEscaped(const char *from, const char *end) {
+  const char *const begin = from;
+  while (static_cast<std::size_t>(end - from) >= BLOCK_BYTES && !HasEscaped<PLACE>(from)) {
+    from += BLOCK_BYTES;
+  }
+  // The octets that are left are the end of one more block, when there are that many octets before them.
+  const bool isLastBlock = static_cast<std::size_t>(end - from) < BLOCK_BYTES;
+  if (isLastBlock && static_cast<std::size_t>(end - begin) >= BLOCK_BYTES && !HasEscaped<PLACE>(end - BLOCK_BYTES)) {
+    return end;
+  }
+  while (from != end && !(ESCAPED_IN[static_cast<unsigned char>(*from)] & PLACE)) {
+    ++from;
+  }
+  return from;
+}
+
 template <Place PLACE>
 void PutEscaped(CanonicalOutput &output, std::string_view text) {
   const char *from = text.data();
   const char *const end = from + text.size();
-  for (const char *at = from; at != end; ++at) {
-    if (ESCAPED_IN[static_cast<unsigned char>(*at)] & PLACE) {
-      output.Put(std::string_view(from, static_cast<std::size_t>(at - from)));
-      output.Put(Escape(*at));
-      from = at + 1;
+  for (;;) {
+    const char *const escaped = FindEscaped<PLACE>(from, end);
+    output.Put(std::string_view(from, static_cast<std::size_t>(escaped - from)));
+    if (escaped == end) {
+      return;
     }
+    output.Put(Escape(*escaped));
+    from = escaped + 1;
   }
-  output.Put(std::string_view(from, static_cast<std::size_t>(end - from)));
 }
 
 } // namespace

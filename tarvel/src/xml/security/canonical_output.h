@@ -19,17 +19,16 @@ public:
   CanonicalOutput(const CanonicalOutput &) = delete;
   CanonicalOutput &operator=(const CanonicalOutput &) = delete;
 
+  /// Puts the pieces, which are texts, one after the other.
   /// @throws XmlSecurityException when the octets altogether pass the limit.
-  void Put(std::string_view octets) {
-    if (octets.size() > m_buffer.size() - m_used) {
-      PutPastBuffer(octets);
-      return;
+  template <typename... Pieces>
+  void Put(const Pieces &...pieces) {
+    if ((std::string_view(pieces).size() + ...) > m_buffer.size() - m_used) {
+      (PutPiece(pieces), ...);
+    } else {
+      (PutIntoBuffer(pieces), ...);
     }
-    octets.copy(m_buffer.data() + m_used, octets.size());
-    m_used += octets.size();
   }
-
-  void Put(char octet) { Put(std::string_view(&octet, 1)); }
 
   /// Character data: ampersand, angle brackets and carriage return escaped.
   void PutText(std::string_view text);
@@ -43,6 +42,17 @@ public:
 private:
   static constexpr std::size_t BUFFER_BYTES = 4096;
 
+  void PutPiece(std::string_view octets) {
+    if (octets.size() > m_buffer.size() - m_used) {
+      PutPastBuffer(octets);
+    } else {
+      PutIntoBuffer(octets);
+    }
+  }
+  void PutIntoBuffer(std::string_view octets) noexcept {
+    octets.copy(m_buffer.data() + m_used, octets.size());
+    m_used += octets.size();
+  }
   void PutPastBuffer(std::string_view octets);
   void Count(std::size_t octets);
 

@@ -46,18 +46,20 @@ void NamespaceBindings::Declare(std::string_view prefix, std::string_view uri) {
   binding.next = m_buckets[binding.bucket];
   m_bindings.push_back(binding);
   m_buckets[binding.bucket] = static_cast<std::uint32_t>(m_bindings.size() - 1);
+  m_recent = NOT_BOUND;
 }
 
-std::size_t NamespaceBindings::Find(std::string_view prefix) const noexcept {
+std::size_t NamespaceBindings::Search(std::string_view prefix) noexcept {
   for (std::uint32_t index = m_buckets[BucketOf(prefix)]; index != END_OF_BUCKET; index = m_bindings[index].next) {
     if (m_bindings[index].prefix == prefix) {
+      m_recent = index;
       return index;
     }
   }
   return NOT_BOUND;
 }
 
-bool NamespaceBindings::Write(std::size_t index) {
+bool NamespaceBindings::WriteAnew(std::size_t index) {
   Binding &binding = m_bindings[index];
   if (binding.isWritten && binding.written == binding.uri) {
     return false;
@@ -68,7 +70,7 @@ bool NamespaceBindings::Write(std::size_t index) {
   return true;
 }
 
-void NamespaceBindings::GoBack(Mark mark) noexcept {
+void NamespaceBindings::Undo(Mark mark) noexcept {
   while (m_changes.size() > mark.changes) {
     const Change &change = m_changes.back();
     m_bindings[change.index].written = change.written;
@@ -78,6 +80,7 @@ void NamespaceBindings::GoBack(Mark mark) noexcept {
   while (m_bindings.size() > mark.bindings) {
     m_buckets[m_bindings.back().bucket] = m_bindings.back().next;
     m_bindings.pop_back();
+    m_recent = NOT_BOUND;
   }
 }
 

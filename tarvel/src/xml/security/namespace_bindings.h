@@ -37,17 +37,29 @@ public:
   void Declare(std::string_view prefix, std::string_view uri);
 
   /// The index of the binding in force for `prefix`, or `NOT_BOUND`.
-  std::size_t Find(std::string_view prefix) const noexcept;
+  std::size_t Find(std::string_view prefix) noexcept {
+    return m_recent != NOT_BOUND && m_bindings[m_recent].prefix == prefix ? m_recent : Search(prefix);
+  }
 
   const Binding &operator[](std::size_t index) const noexcept { return m_bindings[index]; }
   std::size_t Size() const noexcept { return m_bindings.size(); }
 
   /// Notes that the output binds the prefix as the source does. @return whether the output did not do so already, so that
   /// a declaration has to be written.
-  bool Write(std::size_t index);
+  bool Write(std::size_t index) {
+    const Binding &binding = m_bindings[index];
+    // The texts are the same one where nothing was declared since.
+    const bool isSameText =
+        binding.written.data() == binding.uri.data() && binding.written.size() == binding.uri.size();
+    return !(binding.isWritten && isSameText) && WriteAnew(index);
+  }
 
   Mark GetMark() const noexcept { return {m_bindings.size(), m_changes.size()}; }
-  void GoBack(Mark mark) noexcept;
+  void GoBack(Mark mark) noexcept {
+    if (m_changes.size() != mark.changes || m_bindings.size() != mark.bindings) {
+      Undo(mark);
+    }
+  }
 
   static constexpr std::size_t NOT_BOUND = SIZE_MAX;
 
@@ -62,7 +74,11 @@ private:
   };
 
   static std::uint32_t BucketOf(std::string_view prefix) noexcept;
+  std::size_t Search(std::string_view prefix) noexcept;
+  bool WriteAnew(std::size_t index);
+  void Undo(Mark mark) noexcept;
 
+  std::size_t m_recent = NOT_BOUND; // what was found last, as long as it is in force: mostly it is asked for again
   std::array<std::uint32_t, BUCKETS> m_buckets;
   std::vector<Binding> m_bindings;
   std::vector<Change> m_changes;

@@ -1,0 +1,79 @@
+// SPDX-License-Identifier: Apache-2.0
+/// @file
+/// `KeptContexts`, contexts of OpenSSL that are ready for the next use.
+
+#pragma once
+
+#include "system/thread_lane.h"
+
+#include <array>
+#include <atomic>
+#include <cstddef>
+
+namespace Tarvel::Crypto {
+
+/// To make a context costs allocations, and atomic operations on counters that all threads share. A context is for one
+/// thread at a time: so a thread takes one out, uses it and puts it back, the one of its own lane if it is there.
+/// `Handle` is one of the owning handles; there are `KINDS` kinds of contexts, numbered from 0. Lock-free; safe on any
+/// thread. The destructor frees nothing, so that a static object never calls OpenSSL after the end of `main`.
+template <typename Handle, std::size_t KINDS>
+class KeptContexts {
+public:
+  constexpr KeptContexts() noexcept = default;
+  KeptContexts(const KeptContexts &) = delete;
+  KeptContexts &operator=(const KeptContexts &) = delete;
+
+  /// A kept context of that kind; null when there is none at hand.
+  Handle Take(std::size_t kind) noexcept {
+    for (std::size_t distance = 0; distance < LANES; ++distance) {
+      Slot &slot = GetSlot(distance, kind);
+      if (!slot.load(std::memory_order_relaxed)) {
+        continue;
+      }
+      if (Pointer const context = slot.exchange(nullptr, std::memory_order_acquire)) {
+        return Handle(context);
+      }
+    }
+    return nullptr;
+  }
+
+  /// Keeps `context` for the next taker, or frees it when enough are kept already.
+  void Put(std::size_t kind, Handle context) noexcept {
+    for (std::size_t distance = 0; distance < LANES; ++distance) {
+      Pointer expected = nullptr;
+      if (GetSlot(distance, kind)
+              .compare_exchange_strong(expected, context.get(), std::memory_order_release, std::memory_order_relaxed)) {
+        static_cast<void>(context.release()); // the slot owns it now
+        return;
+      }
+    }
+  }
+
+  /// Frees all that is kept. For the owner alone, when nobody else uses the object.
+  void FreeAll() noexcept {
+    for (Lane &lane : m_lanes) {
+      for (Slot &slot : lane.slots) {
+        const Handle freed(slot.exchange(nullptr, std::memory_order_relaxed));
+      }
+    }
+  }
+
+private:
+  static constexpr std::size_t LANES = 4; // threads beyond these that use contexts of one kind at once make their own
+
+  using Pointer = typename Handle::pointer;
+  using Slot = std::atomic<Pointer>;
+
+  struct alignas(System::LANE_ALIGNMENT) Lane {
+    std::array<Slot, KINDS> slots{};
+  };
+
+  /// `distance` is counted in lanes from the calling thread's own.
+  Slot &GetSlot(std::size_t distance, std::size_t kind) noexcept {
+    return m_lanes[(System::GetThreadLane(LANES) + distance) % LANES].slots[kind];
+  }
+
+  std::array<Lane, LANES> m_lanes{};
+};
+
+} // namespace Tarvel::Crypto

@@ -1,0 +1,174 @@
+// SPDX-License-Identifier: Apache-2.0
+
+#include "xml/namespace_scope.h"
+
+#include "core/uri_reference.h"
+#include "xml/reserved_namespaces.h"
+
+#include <algorithm>
+#include <tuple>
+#include <utility>
+
+namespace Tarvel {
+namespace Xml {
+
+namespace {
+
+// Up to this number each attribute is compared with each other; more are sorted first.
+constexpr std::size_t FEW_ATTRIBUTES = 8;
+
+} // namespace
+
+std::size_t NamespaceScope::Enter(const char *tag, const WrittenName &name,
+                                  const std::vector<AttributeEvent> &attributes) {
+  if (name.GetPrefix() == "xmlns") {
+    m_cursor.Refuse(Refusal::XMLNS_ELEMENT, name.text.data());
+  }
+  const std::size_t before = m_declarations.size();
+  for (const AttributeEvent &attribute : attributes) {
+    if (attribute.IsNamespaceDeclaration()) {
+      Declare(attribute);
+    }
+  }
+  if (m_declarations.size() > MAX_NAMESPACES_IN_SCOPE) {
+    m_cursor.Refuse(Refusal::TOO_MANY_DECLARATIONS, tag);
+  }
+  CheckNames(attributes);
+  return m_declarations.size() - before;
+}
+
+void NamespaceScope::Declare(const AttributeEvent &declaration) {
+  const std::string_view prefix = declaration.prefixLength ? declaration.GetLocalName() : std::string_view();
+  CheckDeclaration(declaration, prefix);
+  Declaration declared;
+  declared.prefix = prefix;
+  if (m_cursor.IsInSource(declaration.value)) {
+    declared.written = declaration.value;
+  } else {
+    declared.replaced = std::string(declaration.value);
+  }
+  m_declarations.push_back(std::move(declared));
+}
+
+void NamespaceScope::CheckDeclaration(const AttributeEvent &declaration, std::string_view prefix) const {
+  const std::string_view name = declaration.value;
+  const auto refuse = [&](Refusal refusal, std::string_view found = {}) {
+    m_cursor.Refuse(refusal, declaration.name.data(), found);
+  };
+  if (prefix == "xmlns") {
+    refuse(Refusal::XMLNS_DECLARED);
+  }
+  if (name == XMLNS_NAMESPACE) {
+    refuse(Refusal::XMLNS_NAMESPACE_BOUND);
+  }
+  if ((prefix == "xml") != (name == XML_NAMESPACE)) {
+    refuse(prefix == "xml" ? Refusal::XML_BOUND_TO_OTHER : Refusal::XML_NAMESPACE_BOUND);
+  }
+  if (name.empty() && !prefix.empty()) {
+    refuse(Refusal::PREFIX_UNDECLARED, prefix);
+  }
+  if (!IsUriReference(name)) {
+    refuse(Refusal::NOT_A_URI_REFERENCE, name);
+  }
+}
+
+void NamespaceScope::CheckNames(const std::vector<AttributeEvent> &attributes) {
+  if (attributes.size() > FEW_ATTRIBUTES) {
+    CheckManyNames(attributes);
+    return;
+  }
+  for (std::size_t second = 1; second < attributes.size(); ++second) {
+    for (std::size_t first = 0; first < second; ++first) {
+      CheckPair(attributes[first], attributes[second]);
+    }
+  }
+}
+
+void NamespaceScope::CheckPair(const AttributeEvent &first, const AttributeEvent &second) {
+  if (first.name == second.name) {
+    m_cursor.Refuse(Refusal::ATTRIBUTE_TWICE, second.name.data(), second.name);
+  }
+  if (first.prefixLength == 0 || second.prefixLength == 0 || first.GetLocalName() != second.GetLocalName()) {
+    return;
+  }
+  const std::size_t found = FindNamespace(first.GetPrefix());
+  if (found != UNKNOWN && found == FindNamespace(second.GetPrefix())) {
+    m_cursor.Refuse(Refusal::SAME_NAMESPACE_AND_NAME, second.name.data(), first.name, second.name);
+  }
+}
+
+// Attributes of one local name are neighbours once they are sorted, and among them those of one namespace after a second
+// sorting. Of all pairs that must not be, the one is reported whose second attribute comes first.
+void NamespaceScope::CheckManyNames(const std::vector<AttributeEvent> &attributes) {
+  std::pair<std::size_t, std::size_t> firstPair(UNKNOWN, UNKNOWN); // the second attribute, the first
+  const auto report = [&firstPair](std::size_t first, std::size_t second) {
+    firstPair = std::min(firstPair, {second, first});
+  };
+  const auto sortKey = [&attributes](std::size_t index) {
+    const AttributeEvent &attribute = attributes[index];
+    return std::make_tuple(attribute.GetLocalName(), attribute.GetPrefix(), index);
+  };
+  m_order.resize(attributes.size());
+  for (std::size_t i = 0; i < m_order.size(); ++i) {
+    m_order[i] = i;
+  }
+  std::sort(m_order.begin(), m_order.end(),
+            [&sortKey](std::size_t a, std::size_t b) { return sortKey(a) < sortKey(b); });
+
+  std::vector<std::pair<std::size_t, std::size_t>> inNamespaces; // namespace and attribute, of one local name
+  for (auto begin = m_order.begin(); begin != m_order.end();) {
+    const std::string_view localName = attributes[*begin].GetLocalName();
+    const auto end = std::find_if(begin, m_order.end(), [&attributes, localName](std::size_t index) {
+      return attributes[index].GetLocalName() != localName;
+    });
+    inNamespaces.clear();
+    for (auto next = begin; end - begin > 1 && next != end; ++next) {
+      if (next != begin && attributes[*next].name == attributes[*(next - 1)].name) {
+        report(*(next - 1), *next);
+        continue;
+      }
+      const std::size_t found = FindNamespace(attributes[*next].GetPrefix());
+      if (found != UNKNOWN) {
+        inNamespaces.emplace_back(found, *next);
+      }
+    }
+    std::sort(inNamespaces.begin(), inNamespaces.end());
+    for (std::size_t i = 1; i < inNamespaces.size(); ++i) {
+      if (inNamespaces[i - 1].first == inNamespaces[i].first) {
+        report(inNamespaces[i - 1].second, inNamespaces[i].second);
+      }
+    }
+    begin = end;
+  }
+  if (firstPair.first != UNKNOWN) {
+    CheckPair(attributes[firstPair.second], attributes[firstPair.first]);
+  }
+}
+
+/// The declaration that stands for the namespace that `prefix` is bound to; `UNKNOWN` when it is empty or not bound.
+std::size_t NamespaceScope::FindNamespace(std::string_view prefix) {
+  if (prefix.empty()) {
+    return UNKNOWN;
+  }
+  for (std::size_t i = m_declarations.size(); i > 0; --i) {
+    if (m_declarations[i - 1].prefix == prefix) {
+      return FindRepresentative(i - 1);
+    }
+  }
+  return UNKNOWN;
+}
+
+// Names may be long and asked for often: they are compared once for each declaration.
+std::size_t NamespaceScope::FindRepresentative(std::size_t declaration) {
+  std::size_t &representative = m_declarations[declaration].representative;
+  if (representative == UNKNOWN) {
+    const std::string_view name = m_declarations[declaration].GetNamespace();
+    const auto same = std::find_if(m_declarations.begin(), m_declarations.end(),
+                                   [name](const Declaration &other) { return other.GetNamespace() == name; });
+    representative = static_cast<std::size_t>(same - m_declarations.begin());
+  }
+  return representative;
+}
+
+} // namespace Xml
+} // namespace Tarvel

@@ -1,0 +1,61 @@
+// SPDX-License-Identifier: Apache-2.0
+/// @file
+/// `NamespaceScope`, what Namespaces in XML 1.0 asks of start tags.
+
+#pragma once
+
+#include "xml/source_cursor.h"
+
+#include <tarvel/xml/parser.h>
+
+#include <cstddef>
+#include <cstdint>
+#include <string>
+#include <string_view>
+#include <vector>
+
+namespace Tarvel {
+namespace Xml {
+
+/// The declarations in force, and the rules that need them. An unbound prefix is none of its business.
+class NamespaceScope {
+public:
+  explicit NamespaceScope(const SourceCursor &cursor) noexcept : m_cursor(cursor) {}
+
+  /// Enters an element.
+  /// @param tag where its start tag begins.
+  /// @return the number of its declarations, to be given to `Leave`.
+  /// @throws XMLParseException when two attributes have one name, a declaration is not allowed, or too many are in force.
+  std::size_t Enter(const char *tag, const WrittenName &name, const std::vector<AttributeEvent> &attributes);
+
+  /// Leaves the element that was entered last, with that number of declarations.
+  void Leave(std::size_t declarations) noexcept { m_declarations.resize(m_declarations.size() - declarations); }
+
+private:
+  static constexpr std::size_t UNKNOWN = static_cast<std::size_t>(-1);
+
+  struct Declaration {
+    std::string_view prefix;
+    std::string_view written; // the namespace name as the source has it, if nothing was replaced in it
+    std::string replaced;     // the namespace name otherwise
+    std::size_t representative =
+        UNKNOWN; // the first declaration in force of an equal namespace name, once it was sought
+
+    std::string_view GetNamespace() const noexcept { return replaced.empty() ? written : replaced; }
+  };
+
+  void Declare(const AttributeEvent &declaration);
+  void CheckDeclaration(const AttributeEvent &declaration, std::string_view prefix) const;
+  void CheckNames(const std::vector<AttributeEvent> &attributes);
+  void CheckPair(const AttributeEvent &first, const AttributeEvent &second);
+  void CheckManyNames(const std::vector<AttributeEvent> &attributes);
+  std::size_t FindNamespace(std::string_view prefix);
+  std::size_t FindRepresentative(std::size_t declaration);
+
+  const SourceCursor &m_cursor;
+  std::vector<Declaration> m_declarations;
+  std::vector<std::size_t> m_order; // of the attributes of one element by name, when they are many
+};
+
+} // namespace Xml
+} // namespace Tarvel

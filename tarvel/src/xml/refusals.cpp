@@ -1,0 +1,50 @@
+// SPDX-License-Identifier: Apache-2.0
+
+#include "xml/refusals.h"
+
+#include <tarvel/core/string_util.h>
+#include <tarvel/xml/parser.h>
+
+#include <algorithm>
+#include <string>
+
+namespace Tarvel {
+namespace Xml {
+
+namespace {
+
+constexpr std::size_t NPOS = std::string_view::npos;
+constexpr std::string_view UTF8_MARK = "\xEF\xBB\xBF";
+
+void Replace(std::string &text, std::string_view marker, std::string_view by) {
+  const std::size_t place = text.find(marker);
+  if (place != NPOS) {
+    text.replace(place, marker.size(), StringUtil::Shorten(by));
+  }
+}
+
+} // namespace
+
+SourcePosition GetPosition(std::string_view source, std::size_t offset) noexcept {
+  const std::string_view before = source.substr(0, offset);
+  const std::size_t lastBreak = before.rfind('\n');
+  const std::size_t lineBegin = lastBreak == NPOS ? std::min(GetByteOrderMarkLength(source), offset) : lastBreak + 1;
+  return {static_cast<std::uint32_t>(1 + std::count(before.begin(), before.end(), '\n')),
+          static_cast<std::uint32_t>(1 + offset - lineBegin)};
+}
+
+std::size_t GetByteOrderMarkLength(std::string_view source) noexcept {
+  return source.substr(0, UTF8_MARK.size()) == UTF8_MARK ? UTF8_MARK.size() : 0;
+}
+
+void Refuse(Refusal refusal, std::string_view source, std::size_t offset, std::string_view found,
+            std::string_view alsoFound) {
+  std::string text(REFUSAL_TEXTS[static_cast<std::size_t>(refusal)]);
+  Replace(text, "%2", alsoFound); // first, since what was found may hold "%2"
+  Replace(text, "%1", found);
+  const SourcePosition position = GetPosition(source, offset);
+  throw XMLParseException(text, position.line, position.column);
+}
+
+} // namespace Xml
+} // namespace Tarvel

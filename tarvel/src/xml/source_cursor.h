@@ -1,0 +1,153 @@
+// SPDX-License-Identifier: Apache-2.0
+/// @file
+/// `SourceCursor`, the place in the text of a document that a reader has come to.
+
+#pragma once
+
+#include "xml/refusals.h"
+
+#include <array>
+#include <cstddef>
+#include <cstdint>
+#include <cstring>
+#include <functional>
+#include <string_view>
+
+namespace Tarvel {
+namespace Xml {
+
+/// What an ASCII character can be, as bits. Only white space and the characters of names belong to the grammar; a plain
+/// character is one that its surroundings pass over without a look at it.
+enum CharacterClass : std::uint8_t {
+  SPACE = 1,            // S, production 3
+  NAME_START = 2,       // NameStartChar without the colon
+  NAME = 4,             // NameChar without the colon
+  PLAIN_IN_TEXT = 8,    // all but '<', '&', ']' and CR
+  PLAIN_IN_VALUE = 16,  // all but '<', '&', quotation marks and white space other than spaces
+  PLAIN_IN_MARKUP = 32, // in comments, instructions and CDATA sections: all but '-', ']', '?' and CR
+};
+
+constexpr std::array<std::uint8_t, 256> MakeCharacterClasses() noexcept {
+  std::array<std::uint8_t, 256> classes{};
+  const auto isOneOf = [](char character, std::string_view set) { return set.find(character) != set.npos; };
+  for (unsigned code = 0; code < 0x80; ++code) {
+    const char c = static_cast<char>(code);
+    const bool isLetter = (c >= 'a' && c <= 'z') || (c >= 'A' && c <= 'Z') || c == '_';
+    const bool isInName = isLetter || (c >= '0' && c <= '9') || c == '-' || c == '.';
+    const bool isAccepted = code >= 0x20 || isOneOf(c, "\t\r\n");
+    classes[code] =
+        static_cast<std::uint8_t>((isOneOf(c, " \t\r\n") ? SPACE : 0) | (isLetter ? NAME_START : 0) |
+                                  (isInName ? NAME : 0) | (isAccepted && !isOneOf(c, "<&]\r") ? PLAIN_IN_TEXT : 0) |
+                                  (isAccepted && !isOneOf(c, "<&\"'\t\r\n") ? PLAIN_IN_VALUE : 0) |
+                                  (isAccepted && !isOneOf(c, "-]?\r") ? PLAIN_IN_MARKUP : 0));
+  }
+  return classes;
+}
+
+constexpr std::array<std::uint8_t, 256> CHARACTER_CLASSES = MakeCharacterClasses();
+
+constexpr bool IsOfClass(char character, CharacterClass characterClass) noexcept {
+  return (CHARACTER_CLASSES[static_cast<unsigned char>(character)] & characterClass) != 0;
+}
+
+/// A name as written, and where its prefix ends.
+struct WrittenName {
+  std::string_view text;
+  std::size_t prefixLength = 0; // 0 without a prefix
+
+  std::string_view GetPrefix() const noexcept { return text.substr(0, prefixLength); }
+  std::string_view GetLocalName() const noexcept { return prefixLength ? text.substr(prefixLength + 1) : text; }
+};
+
+/// Never looks at or behind the end of the text.
+class SourceCursor {
+public:
+  /// @param source outlives the cursor.
+  explicit SourceCursor(std::string_view source) noexcept
+      : m_source(source), m_next(source.data()), m_end(source.data() + source.size()) {}
+
+  bool IsAtEnd() const noexcept { return m_next == m_end; }
+
+  /// The byte to come. Not to be asked at the end.
+  char Peek() const noexcept { return *m_next; }
+  bool IsAt(char byte) const noexcept { return m_next != m_end && *m_next == byte; }
+  bool IsAt(std::string_view literal) const noexcept {
+    return static_cast<std::size_t>(m_end - m_next) >= literal.size() &&
+           std::memcmp(m_next, literal.data(), literal.size()) == 0;
+  }
+
+  const char *GetPlace() const noexcept { return m_next; }
+  std::size_t GetOffset(const char *place) const noexcept { return static_cast<std::size_t>(place - m_source.data()); }
+  std::size_t GetRemaining() const noexcept { return static_cast<std::size_t>(m_end - m_next); }
+  std::string_view GetSource() const noexcept { return m_source; }
+
+  /// Whether `text` is a view of the source.
+  bool IsInSource(std::string_view text) const noexcept {
+    const std::less_equal<const char *> isNotAfter;
+    return isNotAfter(m_source.data(), text.data()) && isNotAfter(text.data() + text.size(), m_end);
+  }
+
+  /// The text from `begin` to here.
+  std::string_view GetFrom(const char *begin) const noexcept {
+    return std::string_view(begin, static_cast<std::size_t>(m_next - begin));
+  }
+
+  void Advance(std::size_t bytes) noexcept { m_next += bytes; }
+
+  /// Passes over `literal` if it comes next. @return whether it does.
+  bool Skip(std::string_view literal) noexcept {
+    const bool isHere = IsAt(literal);
+    m_next += isHere ? literal.size() : 0;
+    return isHere;
+  }
+
+  /// Passes over all characters of a class that come next. @return whether there was one.
+  bool SkipAll(CharacterClass characterClass) noexcept {
+    const char *const begin = m_next;
+    const char *next = m_next;
+    while (next != m_end && IsOfClass(*next, characterClass)) {
+      ++next;
+    }
+    m_next = next;
+    return next != begin;
+  }
+
+  /// Passes over one character, which is not at the end, and which need not be ASCII.
+  /// @throws XMLParseException when it is not UTF-8, is not what the declared encoding has, or is one that XML cannot carry.
+  void SkipCharacter() {
+    const unsigned char byte = static_cast<unsigned char>(*m_next);
+    if (byte >= 0x20 && byte < 0x80) {
+      ++m_next;
+    } else {
+      SkipUncommonCharacter();
+    }
+  }
+
+  /// From here on only ASCII is accepted, because the document is declared to be that.
+  void RequireAscii() noexcept { m_isAscii = true; }
+
+  /// Passes over a name without a colon. @return whether one comes next.
+  bool SkipNcName();
+
+  /// Passes over a name with at most one colon, which is between two names. @return an empty name when none comes next.
+  /// @param atEnd the reason when the document ends behind the colon.
+  /// @throws XMLParseException when it has other colons or is too long.
+  WrittenName ReadName(Refusal atEnd);
+
+  /// What comes next is not what must come, for that reason; or what comes next is the end, for the other.
+  [[noreturn]] void RefuseNext(Refusal refusal, Refusal atEnd, std::string_view found = {});
+  [[noreturn]] void Refuse(Refusal refusal, const char *place, std::string_view found = {},
+                           std::string_view alsoFound = {}) const;
+
+private:
+  void SkipUncommonCharacter();
+  bool SkipNonAsciiNameCharacter(bool (*isAccepted)(std::uint32_t));
+
+  std::string_view m_source;
+  const char *m_next;
+  const char *m_end;
+  bool m_isAscii = false;
+};
+
+} // namespace Xml
+} // namespace Tarvel

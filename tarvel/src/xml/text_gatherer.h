@@ -1,0 +1,71 @@
+// SPDX-License-Identifier: Apache-2.0
+/// @file
+/// `TextGatherer`, which puts a text together of what its source has and what replaces parts of it.
+
+#pragma once
+
+#include <cstddef>
+#include <cstring>
+#include <memory>
+#include <string_view>
+
+namespace Tarvel {
+namespace Xml {
+
+/// A text in which nothing was replaced is a view of the source. What replaces a part of the source is never longer than
+/// that part, so that one buffer as long as the rest of the source, made when it is first needed, has room for all texts
+/// that are in use at one time.
+class TextGatherer {
+public:
+  /// @param sourceEnd the end of the source that all texts are from.
+  explicit TextGatherer(const char *sourceEnd) noexcept : m_sourceEnd(sourceEnd) {}
+
+  /// Begins a text at `place` of the source.
+  void Begin(const char *place) noexcept {
+    m_pieceBegin = place;
+    m_text = m_free;
+  }
+
+  /// In place of the source from `begin` to `end`, which are behind all that was replaced before, the text has `by`, which
+  /// is no longer.
+  void Replace(const char *begin, const char *end, std::string_view by) {
+    Gather(begin, by);
+    m_pieceBegin = end;
+  }
+
+  /// The text up to `place` of the source; it is good until the next `Clear`.
+  std::string_view End(const char *place) {
+    if (m_free == m_text) {
+      return std::string_view(m_pieceBegin, static_cast<std::size_t>(place - m_pieceBegin));
+    }
+    Gather(place, std::string_view());
+    return std::string_view(m_text, static_cast<std::size_t>(m_free - m_text));
+  }
+
+  /// Gives up all texts.
+  void Clear() noexcept { m_free = m_buffer.get(); }
+
+private:
+  void Gather(const char *pieceEnd, std::string_view more) {
+    if (!m_buffer) {
+      m_buffer.reset(new char[static_cast<std::size_t>(m_sourceEnd - m_pieceBegin)]);
+      m_text = m_free = m_buffer.get();
+    }
+    Append(std::string_view(m_pieceBegin, static_cast<std::size_t>(pieceEnd - m_pieceBegin)));
+    Append(more);
+  }
+
+  void Append(std::string_view text) noexcept {
+    std::memcpy(m_free, text.data(), text.size());
+    m_free += text.size();
+  }
+
+  const char *m_sourceEnd;
+  const char *m_pieceBegin = nullptr; // of what is not gathered yet
+  std::unique_ptr<char[]> m_buffer;
+  char *m_free = nullptr; // behind all texts
+  char *m_text = nullptr; // the current text begins there
+};
+
+} // namespace Xml
+} // namespace Tarvel

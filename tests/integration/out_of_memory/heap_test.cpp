@@ -1,0 +1,125 @@
+// SPDX-License-Identifier: Apache-2.0
+// Whatever allocation of C++ fails while a document is read or a token verified: the call succeeds all the same, ends with
+// the verdict that it has with enough memory, or throws `std::bad_alloc`.
+#include "integration/out_of_memory/failing_heap.h"
+#include "support/data_file.h"
+
+#include <ssoclient/create_saml_token.h>
+#include <tarvel/crypto/certificate.h>
+#include <tarvel/io/reader.h>
+#include <tarvel/xml/document.h>
+#include <tarvel/xml/parser.h>
+
+#include <gtest/gtest.h>
+
+#include <functional>
+#include <map>
+#include <new>
+#include <string>
+
+namespace {
+
+using Testing::FailingHeap;
+using Testing::ReadDataFile;
+using Testing::Shortage;
+
+const std::string NO_MEMORY = "std::bad_alloc";
+
+/// "done", or the exception's message.
+std::string OutcomeOf(const std::function<void()> &operation, FailingHeap &heap) {
+  try {
+    operation();
+    heap.End();
+    return "done";
+  } catch (const std::bad_alloc &) {
+    heap.End();
+    return NO_MEMORY;
+  } catch (const std::exception &failure) {
+    heap.End();
+    return failure.what();
+  }
+}
+
+/// Runs the operation with each allocation failing in turn, until none is left to fail. Counts the outcomes.
+std::map<std::string, int> Sweep(const std::function<void()> &operation, Shortage shortage) {
+  std::map<std::string, int> outcomes;
+  for (long allocations = 0;; ++allocations) {
+    FailingHeap heap(allocations, shortage);
+    const std::string outcome = OutcomeOf(operation, heap);
+    ++outcomes[outcome];
+    if (!heap.HasFailed()) {
+      return outcomes;
+    }
+  }
+}
+
+/// `full` is the outcome with enough memory.
+void ExpectNothingElse(const std::function<void()> &operation, const std::string &full) {
+  FailingHeap none(1'000'000, Shortage::ONCE);
+  ASSERT_EQ(OutcomeOf(operation, none), full); // what is made once in the life of the process is there now
+  for (const Shortage shortage : {Shortage::ONCE, Shortage::FROM_THEN}) {
+    SCOPED_TRACE(shortage == Shortage::ONCE ? "once" : "from then on");
+    const long before = Testing::CountHeapAllocations();
+    std::map<std::string, int> outcomes = Sweep(operation, shortage);
+    EXPECT_GE(outcomes[full], 1);
+    EXPECT_GE(outcomes[NO_MEMORY], 5);
+    outcomes.erase(full);
+    outcomes.erase(NO_MEMORY);
+    EXPECT_EQ(outcomes, (std::map<std::string, int>{}));
+    EXPECT_EQ(Testing::CountHeapAllocations(), before);
+  }
+}
+
+std::function<void()> Parse(const std::string &xml) {
+  return [xml] {
+    const auto reader = Tarvel::CreateStringReader(xml);
+    Tarvel::Xml::CreateXMLParser(Tarvel::Xml::CreateXMLDocumentHandler())->Parse(*reader);
+  };
+}
+
+/// Many of each that the parser keeps account of, so that it needs memory for them often.
+std::string DocumentOfMany() {
+  std::string xml;
+  for (int depth = 0; depth < 100; ++depth) {
+    const std::string number = std::to_string(depth);
+    xml += "<n" + number + " xmlns:p" + number + "='urn:" + number + "'";
+    for (int attribute = 0; attribute < 30; ++attribute) {
+      xml += " a" + std::to_string(attribute) + "='&lt;'";
+    }
+    xml += ">text &amp; text<![CDATA[ and text]]>";
+  }
+  for (int depth = 99; depth >= 0; --depth) {
+    xml += "</n" + std::to_string(depth) + ">";
+  }
+  return xml;
+}
+
+TEST(HeapThatRunsOut, IsReportedByTheParser) {
+  ExpectNothingElse(Parse(ReadDataFile("tokens/full.xml")), "done");
+  ExpectNothingElse(Parse(DocumentOfMany()), "done");
+}
+
+TEST(HeapThatRunsOut, IsNotTakenForAFaultOfTheDocument) {
+  const std::string xml = DocumentOfMany();
+  ExpectNothingElse(Parse(xml + "x"), "something other than comments and processing instructions follows the document "
+                                      "element at line 1, column " +
+                                          std::to_string(xml.size() + 1));
+}
+
+std::function<void()> Verification(const std::string &xml, const std::string &certificate) {
+  const auto trusted = Tarvel::Crypto::LoadCertificates(Testing::DataPath("tokens/" + certificate + ".crt"));
+  return [xml, trusted] { SsoClient::CreateSamlToken(xml, trusted); };
+}
+
+TEST(HeapThatRunsOut, IsNoVerdictOnAGenuineToken) {
+  ExpectNothingElse(Verification(ReadDataFile("tokens/full.xml"), "sts-rsa"), "done");
+  ExpectNothingElse(Verification(ReadDataFile("tokens/holder-of-key.xml"), "sts-rsa"), "done");
+}
+
+TEST(HeapThatRunsOut, NeverHasATamperedTokenAccepted) {
+  std::string xml = ReadDataFile("tokens/bearer.xml");
+  xml.replace(xml.find("alice"), 5, "malory");
+  ExpectNothingElse(Verification(xml, "sts-rsa"), "Failed to verify signature: token might have been tampered with.");
+}
+
+} // namespace

@@ -1,0 +1,52 @@
+// SPDX-License-Identifier: Apache-2.0
+/// @file
+/// What the platform's reader and its peers make of one document, and the differences between them that are meant.
+
+#pragma once
+
+#include "reading.h"
+
+#include <cstddef>
+#include <string>
+#include <string_view>
+#include <vector>
+
+namespace Testing {
+
+enum class Peer : std::uint8_t {
+  LIBXML2 = 1,
+  EXPAT = 2,                ///< with the rules of namespaces that this test has written down
+  EXPAT_WITH_NAMESPACES = 4 ///< with its own
+};
+
+/// One document, what we make of it and one of the peers does, which differ, and what all peers do.
+struct Difference {
+  std::string_view document;
+  const Reading &ours;
+  const Reading &theirs;
+  const Reading &libxml2;
+  const Reading &expat;
+};
+
+/// A kind of difference that is meant.
+struct DifferenceRule {
+  const char *name;
+  unsigned peers; ///< a sum of `Peer`
+  bool (*applies)(const Difference &difference);
+};
+
+const std::vector<DifferenceRule> &DifferenceRules();
+
+struct Comparison {
+  std::vector<std::size_t> rules; ///< those that were needed, as places in `DifferenceRules()`
+  std::string unexplained;        ///< a difference for which there is no rule; empty when there is none
+  bool isAccepted = false;        ///< by us
+};
+
+/// Reads `document` with everybody.
+Comparison Compare(std::string_view document);
+
+/// `text` with everything but printable ASCII as \xHH.
+std::string Escaped(std::string_view text);
+
+} // namespace Testing

@@ -1,0 +1,750 @@
+// SPDX-License-Identifier: Apache-2.0
+
+#include "generated_xml.h"
+
+#include "xml_mutation.h"
+
+#include <algorithm>
+#include <cstddef>
+#include <cstdio>
+#include <initializer_list>
+#include <string_view>
+#include <vector>
+
+namespace Testing {
+
+namespace {
+
+using namespace std::string_view_literals;
+
+constexpr std::size_t MAX_DEPTH = 5;
+constexpr std::size_t MAX_ELEMENTS = 10;
+
+// The places at which ranges of NameStartChar, NameChar (XML 1.0, productions 4 and 4a) and Char (production 2) begin and end.
+constexpr std::uint32_t NAME_BOUNDARIES[] = {
+    0x2D,   0x2E,   0x30,   0x39,   0x3A,   0x41,   0x5A,   0x5F,   0x61,   0x7A,   0xB7,   0xC0,    0xD6,
+    0xD8,   0xF6,   0xF8,   0x2FF,  0x300,  0x36F,  0x370,  0x37D,  0x37F,  0x1FFF, 0x200C, 0x200D,  0x203F,
+    0x2040, 0x2070, 0x218F, 0x2C00, 0x2FEF, 0x3001, 0xD7FF, 0xF900, 0xFDCF, 0xFDF0, 0xFFFD, 0x10000, 0xEFFFF};
+constexpr std::uint32_t CHARACTER_BOUNDARIES[] = {0x00,   0x09,    0x0A,    0x0D,     0x20,     0x7F,    0x80,
+                                                  0x85,   0x9F,    0x7FF,   0x800,    0x2028,   0xD7FF,  0xD800,
+                                                  0xDBFF, 0xDC00,  0xDFFF,  0xE000,   0xFDD0,   0xFFFD,  0xFFFE,
+                                                  0xFFFF, 0x10000, 0x1FFFE, 0x10FFFF, 0x110000, 0x1FFFFF};
+
+constexpr std::string_view NAMES[] = {"a",  "b",    "c", "item", "A", "_", "z.9", "x-1", "\xC3\xA9t\xC3\xA9",
+                                      "xm", "xmlx", "n0"};
+constexpr std::string_view PREFIXES[] = {"a", "b", "p", "q", "_", "\xD0\xB6", "ns1", "xm", "X"};
+constexpr std::string_view ODD_NAMES[] = {
+    "xml",      "XML",        "xMl",         "xmlns",     "XMLNS",   "xml:a", "xmlns:a",
+    "xml:",     ":",          ":a",          "a:",        "a:b:c",   "a::b",  "a:1",
+    "a:-",      "a:\xC2\xB7", "1",           "-a",        ".",       "a:b",   "xmlns:",
+    "xmlns::",  "xmlns:xml",  "xmlns:xmlns", "xmlns:a:b", "xmlnsa",  "xmla",  "xml-stylesheet",
+    "xml:lang", "xml:space",  "xml:id",      "a\xCC\x80", "\xCC\x80"};
+constexpr std::string_view NAMESPACES[] = {"urn:a", "urn:b",   "http://example.com/x?a=1;b='2'",
+                                           "URN:A", "urn:a:b", "http://example.com/#f"};
+constexpr std::string_view ODD_NAMESPACES[] = {"",
+                                               "http://www.w3.org/XML/1998/namespace",
+                                               "http://www.w3.org/2000/xmlns/",
+                                               "http://www.w3.org/XML/1998/namespace#",
+                                               "http://www.w3.org/2000/xmlns",
+                                               " http://www.w3.org/2000/xmlns/",
+                                               "http&#58;//www.w3.org/2000/xmlns/",
+                                               "http://www.w3.org/XML/1998/namespac&#x65;",
+                                               "relative",
+                                               "a b",
+                                               "urn:a b",
+                                               " urn:a",
+                                               "urn:a\n",
+                                               "urn:\xC3\xBC",
+                                               "urn:%zz",
+                                               "urn:%",
+                                               "urn:%41",
+                                               "urn:[",
+                                               "urn:a|b",
+                                               "urn:a^b`{}",
+                                               "urn:a\\b",
+                                               "urn:&quot;",
+                                               "urn:a&amp;b",
+                                               "urn:&#9;b",
+                                               "http://[::1]/",
+                                               "http://[::1",
+                                               "http://a:b/",
+                                               "http://a:99999999/",
+                                               "http://a@b@c/",
+                                               "//host",
+                                               "?q",
+                                               "#f",
+                                               "#a#b",
+                                               ":",
+                                               ":a",
+                                               "1a:b",
+                                               "a/b:c",
+                                               ".",
+                                               "..",
+                                               "%",
+                                               "http://",
+                                               "http:///",
+                                               "http://h:/",
+                                               "http://h:2147483648/",
+                                               "http://[a/b]",
+                                               "http://[]",
+                                               "urn:#[1]",
+                                               "mailto:a@b"};
+constexpr std::string_view TEXT_PIECES[] = {"text",
+                                            " ",
+                                            "\n",
+                                            "\t",
+                                            "\r\n",
+                                            "\r",
+                                            "\n\r",
+                                            "\r\r\n",
+                                            "&amp;",
+                                            "&lt;",
+                                            "&gt;",
+                                            ">",
+                                            "\"",
+                                            "'",
+                                            "&quot;",
+                                            "&apos;",
+                                            "&#13;",
+                                            "&#xD;",
+                                            "&#10;",
+                                            "&#9;",
+                                            "&#x20;",
+                                            "\xC3\xA4",
+                                            "\xE2\x82\xAC",
+                                            "\xF0\x9F\x98\x80",
+                                            "&#x1F600;",
+                                            "&#xE9;",
+                                            "]]",
+                                            "]]&gt;",
+                                            "]",
+                                            "-",
+                                            "--",
+                                            "?>",
+                                            "0123456789abcdef0123456789abcdef0123456789abcdef"};
+constexpr std::string_view ODD_TEXT_PIECES[] = {"]]>",
+                                                "&",
+                                                "&amp",
+                                                "&;",
+                                                "&#;",
+                                                "&#x;",
+                                                "&#0;",
+                                                "&#x0;",
+                                                "&#1;",
+                                                "&#xFFFE;",
+                                                "&#xFFFF;",
+                                                "&#xD800;",
+                                                "&#xDFFF;",
+                                                "&#x110000;",
+                                                "&#4294967361;",
+                                                "&#x100000041;",
+                                                "&#00000000000000000000065;",
+                                                "&#x0000000000000000000041;",
+                                                "&#99999999999999999999;",
+                                                "&#X41;",
+                                                "&#-1;",
+                                                "&# 65;",
+                                                "&#65 ;",
+                                                "&#x4g;",
+                                                "&#6a;",
+                                                "&amp ;",
+                                                "& amp;",
+                                                "&AMP;",
+                                                "&lt",
+                                                "&nbsp;",
+                                                "&a:b;",
+                                                "&1;",
+                                                "&xml;",
+                                                "%amp;",
+                                                "&#38;",
+                                                "&#60;",
+                                                "&#38;amp;",
+                                                "&#38;#38;",
+                                                "<",
+                                                "\x01",
+                                                "\x7F",
+                                                "\x1F",
+                                                "\x0B",
+                                                "\xC2\x85",
+                                                "\xE2\x80\xA8",
+                                                "&#x85;",
+                                                "&#x7F;",
+                                                "&#x10FFFF;",
+                                                "&#xD;&#xA;"};
+constexpr std::string_view CDATA_PIECES[] = {"x",    "<",  "&",  "&amp;",        ">", "]",         "]]", "]]]", "] ]>",
+                                             "\r\n", "\r", "\"", "\xE2\x82\xAC", " ", "<![CDATA[", "-->"};
+constexpr std::string_view COMMENT_PIECES[] = {"c", " ",  "<",  "&",   ">",  "\r\n", "\r", "\xC3\xA4",
+                                               "-", "- ", "->", "]]>", "\"", "?>",   "<!"};
+constexpr std::string_view DATA_PIECES[] = {"d",    " ",        "?",   "??", ">",     "<", "&",
+                                            "\r\n", "\xC3\xA4", "?x>", "--", "a='b'", "\t"};
+constexpr std::string_view SPACES[] = {" ", "  ", "\n", "\t", "\r\n", "\r", " \n\t"};
+constexpr std::string_view XML_ATTRIBUTES[] = {" xml:lang='en'",     " xml:lang=''",          " xml:space='preserve'",
+                                               " xml:space='other'", " xml:base='http://e/'", " xml:id='a b'",
+                                               " xml:id='a'",        " xml:other=\"1\""};
+constexpr std::string_view MARKS[] = {"\xEF\xBB\xBF",
+                                      "\xEF\xBB\xBF\xEF\xBB\xBF",
+                                      "\xFF\xFE",
+                                      "\xFE\xFF",
+                                      "\xEF\xBB",
+                                      "\xEF",
+                                      "\xFF\xFE\0\0"sv,
+                                      "\0\0\xFE\xFF"sv,
+                                      "\0"sv,
+                                      " ",
+                                      "\n",
+                                      "\xEF\xBB\xBF ",
+                                      "x",
+                                      "\xC2\xA0",
+                                      "+/v8-",
+                                      "\x4C\x6F\xA7\x94"};
+constexpr std::string_view INVALID_UTF8[] = {"\x80",
+                                             "\xBF",
+                                             "\xC0\x80",
+                                             "\xC1\xBF",
+                                             "\xC2",
+                                             "\xC3(",
+                                             "\xC3\xC3",
+                                             "\xE0\x80\x80",
+                                             "\xE0\x9F\xBF",
+                                             "\xE2\x82",
+                                             "\xE2(\xA1",
+                                             "\xED\xA0\x80",
+                                             "\xED\xAF\xBF",
+                                             "\xED\xB0\x80",
+                                             "\xED\xBF\xBF",
+                                             "\xED\xA0\xBD\xED\xB8\x80",
+                                             "\xEF\xBF\xBE",
+                                             "\xEF\xBF\xBF",
+                                             "\xF0\x80\x80\x80",
+                                             "\xF0\x8F\xBF\xBF",
+                                             "\xF0\x9F\x98",
+                                             "\xF0\x9F",
+                                             "\xF4\x8F\xBF\xBF",
+                                             "\xF4\x90\x80\x80",
+                                             "\xF5\x80\x80\x80",
+                                             "\xF8\x88\x80\x80\x80",
+                                             "\xFC\x84\x80\x80\x80\x80",
+                                             "\xFE",
+                                             "\xFF",
+                                             "\xC2\x80",
+                                             "\xDF\xBF",
+                                             "\xE0\xA0\x80",
+                                             "\xF0\x90\x80\x80"};
+constexpr std::string_view VERSIONS[] = {" version='1.0'",
+                                         " version=\"1.0\"",
+                                         " version = '1.0'",
+                                         "\nversion='1.0'",
+                                         " version='1.1'",
+                                         " version='1.2'",
+                                         " version='2.0'",
+                                         " version=''",
+                                         " version='1'",
+                                         " version='1.'",
+                                         " version='1.0 '",
+                                         " version='1.00'",
+                                         " version='01.0'",
+                                         " Version='1.0'",
+                                         " version=1.0",
+                                         " version",
+                                         " version='1.0",
+                                         "version='1.0'",
+                                         "",
+                                         " version='1.0' version='1.0'",
+                                         " version='1.9999999999'",
+                                         " version='a'",
+                                         " version=\"1.0'",
+                                         " version='1.0&#32;'",
+                                         " version='1.-'"};
+constexpr std::string_view ENCODINGS[] = {"",
+                                          " encoding='UTF-8'",
+                                          " encoding=\"utf-8\"",
+                                          " encoding = 'Utf-8'",
+                                          " encoding='US-ASCII'",
+                                          " encoding='us-ascii'",
+                                          " encoding='ASCII'",
+                                          " encoding='ISO-8859-1'",
+                                          " encoding='UTF-16'",
+                                          " encoding='UTF-7'",
+                                          " encoding='utf8'",
+                                          " encoding='UTF8'",
+                                          " encoding=''",
+                                          " encoding='8-UTF'",
+                                          " encoding='UTF-8 '",
+                                          " encoding=' UTF-8'",
+                                          " encoding='UTF 8'",
+                                          "encoding='UTF-8'",
+                                          " encoding=UTF-8",
+                                          " encoding",
+                                          " encoding='UTF-8' encoding='UTF-8'",
+                                          " encoding='x-no-such'",
+                                          " encoding='UCS-4'",
+                                          " encoding='EBCDIC-CP-US'",
+                                          " ENCODING='UTF-8'",
+                                          " encoding='UTF-8'foo",
+                                          " encoding='a\xC3\xA4'",
+                                          " encoding='windows-1252'",
+                                          " encoding='UTF-16LE'"};
+constexpr std::string_view STANDALONES[] = {"",
+                                            " standalone='yes'",
+                                            " standalone=\"no\"",
+                                            " standalone = 'yes'",
+                                            " standalone='maybe'",
+                                            " standalone=''",
+                                            " standalone='YES'",
+                                            "standalone='yes'",
+                                            " standalone='yes' standalone='yes'",
+                                            " standalone=yes",
+                                            " standalone",
+                                            " standalone='yes' encoding='UTF-8'",
+                                            " standalone='yes'x",
+                                            " standalone='yes '",
+                                            " foo='bar'",
+                                            "\tstandalone='no'\n"};
+constexpr std::string_view DECLARATION_ENDS[] = {"?>", " ?>",  "\n?>", ">",    "",     "? >",
+                                                 "/>", "?\?>", "?>\n", "\t?>", "?>?>", "\xC2\xA0?>"};
+constexpr std::string_view TOKENS[] = {"<",
+                                       ">",
+                                       "/",
+                                       "=",
+                                       "\"",
+                                       "'",
+                                       "&",
+                                       ";",
+                                       "!",
+                                       "?",
+                                       "-",
+                                       "--",
+                                       "[",
+                                       "]",
+                                       "]]",
+                                       "<a",
+                                       "<a>",
+                                       "</a>",
+                                       "<a/>",
+                                       "<b>",
+                                       "</b>",
+                                       "<p:a>",
+                                       "</p:a>",
+                                       "<!--",
+                                       "-->",
+                                       "<![CDATA[",
+                                       "]]>",
+                                       "<?p",
+                                       "?>",
+                                       "<?xml",
+                                       " version='1.0'",
+                                       "?><",
+                                       " a='1'",
+                                       " b=\"2\"",
+                                       " a=",
+                                       " xmlns='u:a'",
+                                       " xmlns:p='u:p'",
+                                       " xmlns:p=''",
+                                       " p:a='1'",
+                                       "&amp;",
+                                       "&#65;",
+                                       "&#x",
+                                       "&lt;",
+                                       "\n",
+                                       "\r",
+                                       " ",
+                                       "\t",
+                                       "x",
+                                       "<!DOCTYPE a>",
+                                       "<!DOCTYPE",
+                                       "<!ENTITY a 'b'>",
+                                       "<!",
+                                       "</",
+                                       "/>",
+                                       "\xC3\xA4",
+                                       "\xEF\xBF\xBE",
+                                       "\xEF\xBB\xBF",
+                                       "\0"sv,
+                                       "1",
+                                       ":"};
+
+std::string Utf8(std::uint32_t c) {
+  std::string text;
+  if (c < 0x80) {
+    text += static_cast<char>(c);
+    return text;
+  }
+  if (c >= 0x10000) {
+    text += static_cast<char>(0xF0 | (c >> 18));
+    text += static_cast<char>(0x80 | ((c >> 12) & 0x3F));
+  } else if (c >= 0x800) {
+    text += static_cast<char>(0xE0 | (c >> 12));
+  }
+  if (c >= 0x800) {
+    text += static_cast<char>(0x80 | ((c >> 6) & 0x3F));
+  } else {
+    text += static_cast<char>(0xC0 | (c >> 6));
+  }
+  text += static_cast<char>(0x80 | (c & 0x3F));
+  return text;
+}
+
+class Generator {
+public:
+  explicit Generator(RandomSource &random) : m_random(random), m_oddity(OneNumberOf({0, 0, 0, 150, 60, 25, 8})) {}
+
+  std::string Generate() {
+    if (m_random.OnceIn(12)) {
+      Put(m_random.OnceIn(3) ? m_random.OneOf(MARKS) : MARKS[0]);
+    }
+    if (m_random.OnceIn(3)) {
+      PutDeclaration();
+    }
+    PutOutside();
+    PutElement(1);
+    PutOutside();
+    if (IsOdd()) {
+      Put(OneNumberOf({0, 1}) == 0 ? "text" : "<again/>");
+    }
+    return std::move(m_text);
+  }
+
+private:
+  void Put(std::string_view text) { m_text += text; }
+
+  std::size_t OneNumberOf(std::initializer_list<std::size_t> numbers) {
+    return *(numbers.begin() + m_random.Below(numbers.size()));
+  }
+
+  /// Whether something is written here that most likely is wrong.
+  bool IsOdd() { return m_oddity != 0 && m_random.OnceIn(m_oddity); }
+
+  template <std::size_t COUNT>
+  void PutPieces(const std::string_view (&pieces)[COUNT], std::size_t most = 3) {
+    for (std::size_t count = m_random.Below(most + 1); count != 0; --count) {
+      Put(m_random.OneOf(pieces));
+    }
+  }
+
+  std::string_view Space() { return m_random.OnceIn(4) ? m_random.OneOf(SPACES) : " "sv; }
+
+  void PutOptionalSpace() {
+    if (m_random.OnceIn(6)) {
+      Put(m_random.OneOf(SPACES));
+    }
+  }
+
+  template <std::size_t COUNT>
+  std::uint32_t Boundary(const std::uint32_t (&boundaries)[COUNT]) {
+    const std::uint32_t boundary = boundaries[m_random.Below(COUNT)];
+    return boundary + static_cast<std::uint32_t>(m_random.Below(3)) - (boundary > 0 ? 1 : 0);
+  }
+
+  std::string Name() {
+    if (IsOdd()) {
+      return std::string(m_random.OneOf(ODD_NAMES));
+    }
+    if (IsOdd() || m_random.OnceIn(40)) {
+      const std::string character = Utf8(Boundary(NAME_BOUNDARIES));
+      return m_random.OnceIn(2) ? character : std::string(m_random.OneOf(NAMES)) + character + "z";
+    }
+    return std::string(m_random.OneOf(NAMES));
+  }
+
+  std::string QualifiedName() {
+    if (m_random.OnceIn(3) && !m_declared.empty()) {
+      return m_declared[m_random.Below(m_declared.size())] + ":" + Name();
+    }
+    return m_random.OnceIn(40) ? std::string(m_random.OneOf(PREFIXES)) + ":" + Name() : Name();
+  }
+
+  void PutCharacter() {
+    const std::uint32_t character = Boundary(CHARACTER_BOUNDARIES);
+    char reference[32];
+    switch (m_random.Below(5)) {
+    case 0:
+      std::snprintf(reference, sizeof reference, "&#%u;", character);
+      return Put(reference);
+    case 1:
+      std::snprintf(reference, sizeof reference, m_random.OnceIn(2) ? "&#x%X;" : "&#x0%x;", character);
+      return Put(reference);
+    case 2:
+      return Put(m_random.OneOf(INVALID_UTF8));
+    default:
+      return Put(Utf8(character));
+    }
+  }
+
+  void PutText() {
+    PutPieces(TEXT_PIECES);
+    if (IsOdd()) {
+      Put(m_random.OneOf(ODD_TEXT_PIECES));
+    }
+    if (IsOdd() || m_random.OnceIn(30)) {
+      PutCharacter();
+    }
+  }
+
+  void PutInstruction() {
+    const std::string target = Name();
+    Put("<?" + target);
+    if (!m_random.OnceIn(3)) {
+      Put(IsOdd() ? std::string_view() : Space());
+      PutPieces(DATA_PIECES);
+      if (IsOdd()) {
+        PutCharacter();
+      }
+    }
+    Put(IsOdd() ? "?" : "?>");
+  }
+
+  void PutComment() {
+    Put("<!--");
+    const std::size_t begin = m_text.size();
+    PutPieces(COMMENT_PIECES);
+    if (IsOdd()) {
+      PutCharacter();
+    }
+    if (m_oddity == 0 || !m_random.OnceIn(m_oddity)) { // what is not odd must not have two hyphens
+      RemoveRuns(begin);
+    }
+    Put(IsOdd() ? "--" : "-->");
+  }
+
+  void RemoveRuns(std::size_t begin) {
+    for (std::size_t i = begin; i < m_text.size(); ++i) {
+      if (m_text[i] == '-' && (i + 1 == m_text.size() || m_text[i + 1] == '-')) {
+        m_text[i] = '+';
+      }
+    }
+  }
+
+  void PutCData() {
+    Put("<![CDATA[");
+    PutPieces(CDATA_PIECES);
+    if (IsOdd()) {
+      PutCharacter();
+    }
+    Put(IsOdd() ? "]]" : "]]>");
+  }
+
+  void PutOutside() {
+    for (std::size_t count = m_random.OnceIn(2) ? 0 : m_random.Below(4); count != 0; --count) {
+      switch (m_random.Below(IsOdd() ? 5 : 3)) {
+      case 0:
+        Put(m_random.OneOf(SPACES));
+        break;
+      case 1:
+        PutComment();
+        break;
+      case 2:
+        PutInstruction();
+        break;
+      case 3:
+        Put(m_random.OnceIn(2) ? "<!DOCTYPE a>" : "<!DOCTYPE a [<!ENTITY e 'x'>]>");
+        break;
+      default:
+        Put(m_random.OnceIn(2) ? "&#32;" : "<![CDATA[]]>");
+      }
+    }
+  }
+
+  void PutDeclaration() {
+    const bool isOdd = IsOdd() || m_random.OnceIn(4);
+    Put(isOdd && m_random.OnceIn(12) ? "<?XML" : "<?xml");
+    Put(isOdd && m_random.OnceIn(2) ? m_random.OneOf(VERSIONS) : VERSIONS[m_random.Below(4)]);
+    Put(isOdd ? m_random.OneOf(ENCODINGS) : ENCODINGS[m_random.Below(6)]);
+    Put(isOdd && m_random.OnceIn(2) ? m_random.OneOf(STANDALONES) : STANDALONES[m_random.Below(4)]);
+    Put(isOdd && m_random.OnceIn(2) ? m_random.OneOf(DECLARATION_ENDS) : DECLARATION_ENDS[m_random.Below(3)]);
+  }
+
+  void PutValue(std::string_view value) {
+    const char quote = value.find('"') == std::string_view::npos && m_random.OnceIn(2) ? '"' : '\'';
+    m_text += quote;
+    for (const char character : value) {
+      if (character != quote) {
+        m_text += character;
+      }
+    }
+    m_text += IsOdd() ? '"' : quote;
+  }
+
+  std::string AttributeValue() {
+    const std::size_t begin = m_text.size();
+    PutText();
+    const std::string value = m_text.substr(begin);
+    m_text.resize(begin);
+    return value;
+  }
+
+  void PutAttribute(const std::string &name, std::string_view value) {
+    Put(IsOdd() ? std::string_view() : Space());
+    Put(name);
+    PutOptionalSpace();
+    Put(IsOdd() ? "" : "=");
+    PutOptionalSpace();
+    PutValue(value);
+  }
+
+  void PutStartTag(const std::string &name, std::vector<std::string> &declared) {
+    Put("<" + name);
+    for (std::size_t count = m_random.OnceIn(2) ? 0 : m_random.Below(4); count != 0; --count) {
+      const bool isDefault = m_random.OnceIn(4);
+      const std::string prefix(m_random.OneOf(PREFIXES));
+      bool isTwice = false;
+      for (const std::string &other : declared) {
+        isTwice = isTwice || other == (isDefault ? "" : prefix);
+      }
+      if (isTwice && !IsOdd()) {
+        continue;
+      }
+      declared.push_back(isDefault ? "" : prefix);
+      const bool isOddName = IsOdd() || m_random.OnceIn(16);
+      PutAttribute(isDefault ? "xmlns" : "xmlns:" + prefix,
+                   isOddName ? m_random.OneOf(ODD_NAMESPACES) : m_random.OneOf(NAMESPACES));
+    }
+    if (m_random.OnceIn(12)) {
+      Put(m_random.OneOf(XML_ATTRIBUTES));
+    }
+    if (m_random.OnceIn(30)) {
+      Put(" xmlns:xml='http://www.w3.org/XML/1998/namespace'");
+    }
+    std::vector<std::string> names;
+    for (std::size_t count = m_random.Below(4); count != 0; --count) {
+      const std::string attribute = QualifiedName();
+      if (std::find(names.begin(), names.end(), attribute) == names.end() || IsOdd()) {
+        names.push_back(attribute);
+        PutAttribute(attribute, AttributeValue());
+      }
+    }
+    PutOptionalSpace();
+  }
+
+  // The depth is bounded by MAX_DEPTH.
+  void PutElement(std::size_t depth) {
+    ++m_elements;
+    const std::size_t outside = m_declared.size();
+    std::vector<std::string> declared;
+    // A start tag may use what it declares: the names are made afterwards.
+    const std::string name = QualifiedName();
+    PutStartTag(name, declared);
+    for (const std::string &prefix : declared) {
+      if (!prefix.empty()) {
+        m_declared.push_back(prefix);
+      }
+    }
+    if (m_random.OnceIn(4)) {
+      Put(IsOdd() ? "/ >" : "/>");
+      m_declared.resize(outside);
+      return;
+    }
+    Put(">");
+    for (std::size_t count = m_random.Below(5); count != 0; --count) {
+      PutContent(depth);
+    }
+    Put("</" + (IsOdd() ? Name() : name));
+    PutOptionalSpace();
+    Put(IsOdd() ? " a='1'>" : ">");
+    m_declared.resize(outside);
+  }
+
+  void PutContent(std::size_t depth) {
+    switch (m_random.Below(9)) {
+    case 0:
+      return PutCData();
+    case 1:
+      return PutComment();
+    case 2:
+      return PutInstruction();
+    case 3:
+    case 4:
+    case 5:
+      return PutText();
+    default:
+      if (depth < MAX_DEPTH && m_elements < MAX_ELEMENTS) {
+        PutElement(depth + 1);
+      }
+    }
+  }
+
+  RandomSource &m_random;
+  const std::size_t m_oddity; // one in so many things is odd; 0: none
+  std::size_t m_elements = 0;
+  std::vector<std::string> m_declared; // prefixes in scope
+  std::string m_text;
+};
+
+std::string TokenSoup(RandomSource &random) {
+  std::string text = random.OnceIn(2) ? "<a>" : "";
+  for (std::size_t count = 1 + random.Below(12); count != 0; --count) {
+    text += random.OneOf(TOKENS);
+  }
+  return text + (text.size() > 2 && random.OnceIn(2) ? "</a>" : "");
+}
+
+std::string Repeated(std::string_view text, std::size_t count) {
+  std::string repeated;
+  for (; count != 0; --count) {
+    repeated += text;
+  }
+  return repeated;
+}
+
+/// At a limit of the platform, one below it or one above.
+std::string AtLimit(RandomSource &random) {
+  const std::size_t count = 255 + random.Below(3);
+  switch (random.Below(4)) {
+  case 0:
+    return Repeated("<a>", count) + Repeated("</a>", count);
+  case 1: {
+    std::string tag = "<a";
+    for (std::size_t i = 0; i < count; ++i) {
+      tag += (random.OnceIn(2) ? " a" : " xmlns:a") + std::to_string(i) + "='x:'";
+    }
+    return tag + "/>";
+  }
+  case 2: {
+    std::string tags;
+    for (std::size_t i = 0; i < count; i += 16) {
+      tags += "<a";
+      for (std::size_t k = i; k < i + 16 && k < count; ++k) {
+        tags += " xmlns:a" + std::to_string(k) + "='x:'";
+      }
+      tags += ">";
+    }
+    return tags + Repeated("</a>", (count + 15) / 16);
+  }
+  default: {
+    const std::string name(4094 + random.Below(4), 'n');
+    return random.OnceIn(2) ? "<" + name + "/>" : "<?" + name + "?><a " + name + "='" + name + "'/>";
+  }
+  }
+}
+
+/// ASCII only; other octets become characters of their own.
+std::string ToUtf16(std::string_view text, RandomSource &random) {
+  const bool isBigEndian = random.OnceIn(2);
+  std::string recoded = random.OnceIn(3) ? "" : isBigEndian ? "\xFE\xFF" : "\xFF\xFE";
+  for (const char octet : text) {
+    recoded += isBigEndian ? '\0' : octet;
+    recoded += isBigEndian ? octet : '\0';
+  }
+  return recoded;
+}
+
+} // namespace
+
+std::string GenerateXml(std::uint64_t seed) {
+  RandomSource random(seed);
+  if (random.OnceIn(2000)) {
+    return AtLimit(random);
+  }
+  std::string text = random.OnceIn(12) ? TokenSoup(random) : Generator(random).Generate();
+  if (random.OnceIn(400)) {
+    text = ToUtf16(text, random);
+  }
+  if (random.OnceIn(3)) {
+    const std::string other = random.OnceIn(4) ? Generator(random).Generate() : TokenSoup(random);
+    for (std::size_t count = 1 + random.Below(random.OnceIn(3) ? 4 : 1); count != 0; --count) {
+      Mutate(text, other, random);
+    }
+  }
+  return text;
+}
+
+} // namespace Testing

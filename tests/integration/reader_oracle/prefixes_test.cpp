@@ -1,0 +1,65 @@
+// SPDX-License-Identifier: Apache-2.0
+// Documents that are cut off: no reader accepts one that another refuses.
+
+#include "comparison.h"
+
+#include "support/data_file.h"
+#include "support/repetitions.h"
+
+#include <gtest/gtest.h>
+
+#include <algorithm>
+#include <filesystem>
+#include <fstream>
+#include <iterator>
+#include <string>
+#include <string_view>
+#include <vector>
+
+namespace {
+
+// In the everyday run, of the documents beyond the one length only prefixes at the other distance.
+constexpr std::size_t LARGE = 20'000;
+constexpr std::size_t LARGE_STEP = 211;
+
+/// The texts of all documents among the test data, sorted, so that those with a common beginning are neighbours.
+std::vector<std::string> AllDocuments() {
+  std::vector<std::string> documents;
+  for (const auto &entry : std::filesystem::recursive_directory_iterator(Testing::DataPath(""))) {
+    if (entry.path().extension() == ".xml") {
+      std::ifstream file(entry.path(), std::ios::binary);
+      documents.emplace_back(std::istreambuf_iterator<char>(file), std::istreambuf_iterator<char>());
+    }
+  }
+  std::sort(documents.begin(), documents.end());
+  return documents;
+}
+
+/// Whether a prefix of that length ends at "<" or ">", or is one of those in between that are taken all the same.
+bool IsNearBoundary(std::string_view text, std::size_t length) {
+  constexpr std::size_t STEP = 251;
+  const std::size_t begin = length == 0 ? 0 : length - 1;
+  return text.substr(begin, 2).find_first_of("<>") != std::string_view::npos || length % STEP == 0;
+}
+
+TEST(PrefixesOfDocuments, AreReadByAllReadersAlike) {
+  const bool isFull = Testing::Repetitions(true, false); // otherwise those at boundaries of markup, and some
+  std::string former;
+  std::size_t accepted = 0;
+  for (const std::string &document : AllDocuments()) {
+    const auto different = std::mismatch(document.begin(), document.end(), former.begin(), former.end()).first;
+    const std::size_t common = static_cast<std::size_t>(different - document.begin());
+    for (std::size_t length = former.empty() ? 0 : common + 1; length <= document.size(); ++length) {
+      if (!isFull && (document.size() > LARGE ? length % LARGE_STEP != 0 : !IsNearBoundary(document, length))) {
+        continue;
+      }
+      const Testing::Comparison comparison = Testing::Compare(std::string_view(document).substr(0, length));
+      ASSERT_EQ(comparison.unexplained, "") << "the first " << length << " octets";
+      accepted += comparison.isAccepted ? 1u : 0u;
+    }
+    former = document;
+  }
+  EXPECT_GT(accepted, 100u); // those whole, and without the line break at the end
+}
+
+} // namespace

@@ -1,0 +1,50 @@
+// SPDX-License-Identifier: Apache-2.0
+// Generated documents, read by us and by others.
+
+#include "comparison.h"
+#include "generated_xml.h"
+
+#include "support/repetitions.h"
+
+#include <gtest/gtest.h>
+
+#include <cstdint>
+#include <iostream>
+#include <string>
+#include <vector>
+
+namespace {
+
+using Testing::Compare;
+using Testing::Comparison;
+using Testing::DifferenceRules;
+
+const std::size_t DOCUMENTS = Testing::Repetitions<std::size_t>(2'000'000, 20'000);
+constexpr std::size_t MOST_FINDINGS = 20;
+
+TEST(GeneratedDocuments, AreReadByAllReadersAlikeButForNamedDifferences) {
+  std::vector<std::size_t> counts(DifferenceRules().size());
+  std::size_t accepted = 0;
+  std::size_t findings = 0;
+  for (std::uint64_t seed = 0; seed < DOCUMENTS; ++seed) {
+    const std::string document = Testing::GenerateXml(seed);
+    const Comparison comparison = Compare(document);
+    accepted += comparison.isAccepted ? 1u : 0u;
+    for (const std::size_t rule : comparison.rules) {
+      ++counts[rule];
+    }
+    if (!comparison.unexplained.empty()) {
+      ADD_FAILURE() << "document " << seed << ":\n" << comparison.unexplained;
+      ASSERT_LT(++findings, MOST_FINDINGS);
+    }
+  }
+  std::cout << accepted << " of " << DOCUMENTS << " documents are accepted\n";
+  for (std::size_t i = 0; i < counts.size(); ++i) {
+    std::cout << counts[i] << " times " << DifferenceRules()[i].name << "\n";
+    if (DOCUMENTS >= 2'000'000) {
+      EXPECT_NE(counts[i], 0u) << "the rule never applies: " << DifferenceRules()[i].name;
+    }
+  }
+}
+
+} // namespace

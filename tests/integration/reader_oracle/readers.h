@@ -1,0 +1,30 @@
+// SPDX-License-Identifier: Apache-2.0
+/// @file
+/// The readers that are compared: the platform's, libxml2's, and expat's in both of its forms.
+
+#pragma once
+
+#include "reading.h"
+
+#include <string_view>
+
+namespace Testing {
+
+Reading ReadWithPlatform(std::string_view document);
+
+/// The platform's reader without the copy of the document that the parser above it makes.
+Reading ReadInPlace(std::string_view document);
+
+/// libxml2's SAX2 interface with namespaces. Refused is what is not well-formed, and every error of namespaces but an unbound
+/// prefix. The declared encoding does not count.
+Reading ReadWithLibxml2(std::string_view document);
+
+/// expat without namespaces; those are judged here, by rules written for this test: code `NAMESPACE_FAULT`.
+Reading ReadWithExpat(std::string_view document);
+
+/// expat's own reading of namespaces, which refuses an unbound prefix.
+Reading ReadWithNamespacesOfExpat(std::string_view document);
+
+constexpr int NAMESPACE_FAULT = 1000; ///< beyond expat's own numbers
+
+} // namespace Testing

@@ -1,0 +1,25 @@
+// SPDX-License-Identifier: Apache-2.0
+/// @file
+/// The C++ heap of this program, counted.
+
+#pragma once
+
+#include <cstddef>
+
+namespace Attacks {
+
+/// Octets from the heap since it began: all that were asked for, and the most that were in use at once. One at a time, in a
+/// program that allocates on one thread.
+class HeapCount {
+public:
+  HeapCount() noexcept;
+
+  std::size_t GetAllocated() const noexcept;
+  std::size_t GetPeak() const noexcept;
+
+private:
+  std::size_t m_allocatedBefore;
+  std::size_t m_liveBefore;
+};
+
+} // namespace Attacks
