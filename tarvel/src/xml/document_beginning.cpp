@@ -35,7 +35,7 @@ public:
     const std::string_view quote = m_cursor.IsAt('\'') ? "'" : "\"";
     Require(quote);
     const char *const begin = m_cursor.GetPlace();
-    m_cursor.SkipAll(PLAIN_IN_VALUE);
+    m_cursor.SkipPlain<PLAIN_IN_VALUE>();
     const std::string_view value = m_cursor.GetFrom(begin);
     Require(quote);
     return value;

@@ -212,7 +212,7 @@ std::string_view DocumentReader::ReadValue(std::string_view name) {
   m_cursor.Advance(1);
   m_gatherer.Begin(m_cursor.GetPlace());
   for (;;) {
-    m_cursor.SkipAll(PLAIN_IN_VALUE);
+    m_cursor.SkipPlain<PLAIN_IN_VALUE>();
     if (m_cursor.IsAtEnd()) {
       m_cursor.Refuse(Refusal::ENDS_IN_VALUE, m_cursor.GetPlace(), name);
     }
@@ -250,6 +250,10 @@ void DocumentReader::ReadEndTag() {
     m_cursor.Refuse(Refusal::END_TAG_WITHOUT_START_TAG, tag);
   }
   m_cursor.Advance(2);
+  if (m_cursor.Skip(m_open.back().name, '>')) { // as nearly all are
+    EndElement();
+    return;
+  }
   const WrittenName name = m_cursor.ReadName(Refusal::ENDS_IN_END_TAG);
   if (name.text.empty()) {
     m_cursor.RefuseNext(Refusal::NO_NAME_IN_END_TAG, Refusal::ENDS_IN_END_TAG);
@@ -275,7 +279,7 @@ void DocumentReader::ReadText() {
   const char *const begin = m_cursor.GetPlace();
   m_gatherer.Begin(begin);
   for (;;) {
-    m_cursor.SkipAll(PLAIN_IN_TEXT);
+    m_cursor.SkipPlain<PLAIN_IN_TEXT>();
     if (m_cursor.IsAtEnd()) {
       break;
     }
@@ -308,7 +312,7 @@ void DocumentReader::ReadCData() {
   m_cursor.Advance(CDATA_BEGIN.size());
   m_gatherer.Replace(begin, m_cursor.GetPlace(), "");
   for (;;) {
-    m_cursor.SkipAll(PLAIN_IN_MARKUP);
+    m_cursor.SkipPlain<PLAIN_IN_MARKUP>();
     if (m_cursor.IsAtEnd()) {
       m_cursor.Refuse(Refusal::ENDS_IN_CDATA, m_cursor.GetPlace());
     }
@@ -345,7 +349,7 @@ void DocumentReader::ReadComment() {
   m_cursor.Advance(COMMENT_BEGIN.size());
   m_gatherer.Begin(m_cursor.GetPlace());
   for (;;) {
-    m_cursor.SkipAll(PLAIN_IN_MARKUP);
+    m_cursor.SkipPlain<PLAIN_IN_MARKUP>();
     if (m_cursor.IsAtEnd()) {
       m_cursor.Refuse(Refusal::ENDS_IN_COMMENT, m_cursor.GetPlace());
     }
@@ -376,7 +380,7 @@ void DocumentReader::ReadInstruction() {
   }
   m_gatherer.Begin(m_cursor.GetPlace());
   for (;;) {
-    m_cursor.SkipAll(PLAIN_IN_MARKUP);
+    m_cursor.SkipPlain<PLAIN_IN_MARKUP>();
     if (m_cursor.IsAtEnd()) {
       m_cursor.Refuse(Refusal::ENDS_IN_INSTRUCTION, m_cursor.GetPlace());
     }

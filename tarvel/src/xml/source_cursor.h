@@ -7,6 +7,7 @@
 #include "xml/refusals.h"
 
 #include <array>
+#include <bit>
 #include <cstddef>
 #include <cstdint>
 #include <cstring>
@@ -48,6 +49,28 @@ constexpr std::array<std::uint8_t, 256> CHARACTER_CLASSES = MakeCharacterClasses
 
 constexpr bool IsOfClass(char character, CharacterClass characterClass) noexcept {
   return (CHARACTER_CLASSES[static_cast<unsigned char>(character)] & characterClass) != 0;
+}
+
+/// The high bits of those bytes of `word` that may not be plain: control characters, what is not ASCII, and what the class
+/// leaves out. A bit is right at least up to the first byte in memory that is set where the lowest byte comes first.
+template <CharacterClass PLAIN>
+constexpr std::uint64_t MarkDoubtfulBytes(std::uint64_t word) noexcept {
+  constexpr std::uint64_t EACH = 0x0101010101010101;
+  constexpr std::uint64_t HIGH_BITS = 0x80 * EACH;
+  const auto marksOf = [word](char c) {
+    const std::uint64_t zeroWhereEqual = word ^ EACH * static_cast<unsigned char>(c);
+    return (zeroWhereEqual - EACH) & ~zeroWhereEqual;
+  };
+  std::uint64_t marks = word | ((word - 0x20 * EACH) & ~word);
+  if constexpr (PLAIN == PLAIN_IN_TEXT) {
+    marks |= marksOf('<') | marksOf('&') | marksOf(']');
+  } else if constexpr (PLAIN == PLAIN_IN_VALUE) {
+    marks |= marksOf('<') | marksOf('&') | marksOf('"') | marksOf('\'');
+  } else {
+    static_assert(PLAIN == PLAIN_IN_MARKUP);
+    marks |= marksOf('-') | marksOf(']') | marksOf('?');
+  }
+  return marks & HIGH_BITS;
 }
 
 /// A name as written, and where its prefix ends.
@@ -101,6 +124,27 @@ public:
     return isHere;
   }
 
+  /// Passes over `literal` with `last` behind it if both come next. @return whether they do.
+  bool Skip(std::string_view literal, char last) noexcept {
+    const bool isHere = GetRemaining() > literal.size() && m_next[literal.size()] == last && IsAt(literal);
+    m_next += isHere ? literal.size() + 1 : 0;
+    return isHere;
+  }
+
+  /// Passes over the plain characters of a class that come next, eight at a time.
+  template <CharacterClass PLAIN>
+  void SkipPlain() noexcept {
+    const char *next = m_next;
+    for (;;) {
+      next = SkipPlainWords<PLAIN>(next);
+      if (next == m_end || !IsOfClass(*next, PLAIN)) {
+        break;
+      }
+      ++next;
+    }
+    m_next = next;
+  }
+
   /// Passes over all characters of a class that come next. @return whether there was one.
   bool SkipAll(CharacterClass characterClass) noexcept {
     const char *const begin = m_next;
@@ -140,6 +184,19 @@ public:
                            std::string_view alsoFound = {}) const;
 
 private:
+  /// The first byte at `next` or behind it that is not plain for sure, or one of the last bytes of the text.
+  template <CharacterClass PLAIN>
+  const char *SkipPlainWords(const char *next) const noexcept {
+    for (std::uint64_t word = 0; m_end - next >= static_cast<std::ptrdiff_t>(sizeof word); next += sizeof word) {
+      std::memcpy(&word, next, sizeof word);
+      const std::uint64_t marks = MarkDoubtfulBytes<PLAIN>(word);
+      if (marks) {
+        return std::endian::native == std::endian::little ? next + std::countr_zero(marks) / 8 : next;
+      }
+    }
+    return next;
+  }
+
   void SkipUncommonCharacter();
   bool SkipNonAsciiNameCharacter(bool (*isAccepted)(std::uint32_t));
 
