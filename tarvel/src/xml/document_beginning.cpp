@@ -24,14 +24,14 @@ public:
 
   /// The value of the part `name`, or nothing when another part or the end comes next.
   std::optional<std::string_view> Read(std::string_view name) {
-    m_isAfterSpace = m_cursor.SkipAll(SPACE) || m_isAfterSpace;
+    m_isAfterSpace = m_cursor.SkipSpace() || m_isAfterSpace;
     if (!m_isAfterSpace || !m_cursor.Skip(name)) {
       return std::nullopt;
     }
     m_isAfterSpace = false;
-    m_cursor.SkipAll(SPACE);
+    m_cursor.SkipSpace();
     Require("=");
-    m_cursor.SkipAll(SPACE);
+    m_cursor.SkipSpace();
     const std::string_view quote = m_cursor.IsAt('\'') ? "'" : "\"";
     Require(quote);
     const char *const begin = m_cursor.GetPlace();
@@ -48,7 +48,7 @@ public:
   }
 
   void End() {
-    m_cursor.SkipAll(SPACE);
+    m_cursor.SkipSpace();
     Require("?>");
   }
 

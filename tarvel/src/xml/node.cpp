@@ -9,6 +9,7 @@
 #include <tarvel/core/exception.h>
 #include <tarvel/core/string_util.h>
 
+#include <algorithm>
 #include <string>
 #include <utility>
 
@@ -223,9 +224,9 @@ void ElementNode::AppendText(std::string_view value) {
 }
 
 void ElementNode::SetName(std::string_view name) noexcept {
-  const std::size_t colon = name.find(':');
+  const auto colon = std::find(name.begin(), name.end(), ':');
   m_name = name;
-  m_prefixLength = colon == std::string_view::npos ? 0 : static_cast<std::uint32_t>(colon);
+  m_prefixLength = colon == name.end() ? 0 : static_cast<std::uint32_t>(colon - name.begin());
 }
 
 void ElementNode::AppendAttribute(AttributeEnd &end, std::string_view name, std::size_t prefixLength,

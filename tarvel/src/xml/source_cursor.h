@@ -23,9 +23,9 @@ enum CharacterClass : std::uint8_t {
   SPACE = 1,            // S, production 3
   NAME_START = 2,       // NameStartChar without the colon
   NAME = 4,             // NameChar without the colon
-  PLAIN_IN_TEXT = 8,    // all but '<', '&', ']' and CR
+  PLAIN_IN_TEXT = 8,    // all but '<', '&', ']' and line ends
   PLAIN_IN_VALUE = 16,  // all but '<', '&', quotation marks and white space other than spaces
-  PLAIN_IN_MARKUP = 32, // in comments, instructions and CDATA sections: all but '-', ']', '?' and CR
+  PLAIN_IN_MARKUP = 32, // in comments, instructions and CDATA sections: all but '-', ']', '?' and line ends
 };
 
 constexpr std::array<std::uint8_t, 256> MakeCharacterClasses() noexcept {
@@ -38,9 +38,9 @@ constexpr std::array<std::uint8_t, 256> MakeCharacterClasses() noexcept {
     const bool isAccepted = code >= 0x20 || isOneOf(c, "\t\r\n");
     classes[code] =
         static_cast<std::uint8_t>((isOneOf(c, " \t\r\n") ? SPACE : 0) | (isLetter ? NAME_START : 0) |
-                                  (isInName ? NAME : 0) | (isAccepted && !isOneOf(c, "<&]\r") ? PLAIN_IN_TEXT : 0) |
+                                  (isInName ? NAME : 0) | (isAccepted && !isOneOf(c, "<&]\r\n") ? PLAIN_IN_TEXT : 0) |
                                   (isAccepted && !isOneOf(c, "<&\"'\t\r\n") ? PLAIN_IN_VALUE : 0) |
-                                  (isAccepted && !isOneOf(c, "-]?\r") ? PLAIN_IN_MARKUP : 0));
+                                  (isAccepted && !isOneOf(c, "-]?\r\n") ? PLAIN_IN_MARKUP : 0));
   }
   return classes;
 }
@@ -87,7 +87,8 @@ class SourceCursor {
 public:
   /// @param source outlives the cursor.
   explicit SourceCursor(std::string_view source) noexcept
-      : m_source(source), m_next(source.data()), m_end(source.data() + source.size()) {}
+      : m_source(source), m_next(source.data()), m_end(source.data() + source.size()),
+        m_lineBegin(source.data() + GetByteOrderMarkLength(source)) {}
 
   bool IsAtEnd() const noexcept { return m_next == m_end; }
 
@@ -110,14 +111,27 @@ public:
     return isNotAfter(m_source.data(), text.data()) && isNotAfter(text.data() + text.size(), m_end);
   }
 
+  /// Line and column of what comes next.
+  SourcePosition GetPosition() const noexcept {
+    return {m_line, static_cast<std::uint32_t>(1 + (m_next - m_lineBegin))};
+  }
+
   /// The text from `begin` to here.
   std::string_view GetFrom(const char *begin) const noexcept {
     return std::string_view(begin, static_cast<std::size_t>(m_next - begin));
   }
 
+  /// Passes over that many bytes, none of which is a line feed.
   void Advance(std::size_t bytes) noexcept { m_next += bytes; }
 
-  /// Passes over `literal` if it comes next. @return whether it does.
+  /// Passes over a line feed if one comes next.
+  void SkipLineFeed() noexcept {
+    if (IsAt('\n')) {
+      BeginLine(++m_next);
+    }
+  }
+
+  /// Passes over `literal`, which has no line feed, if it comes next. @return whether it does.
   bool Skip(std::string_view literal) noexcept {
     const bool isHere = IsAt(literal);
     m_next += isHere ? literal.size() : 0;
@@ -131,29 +145,36 @@ public:
     return isHere;
   }
 
-  /// Passes over the plain characters of a class that come next, eight at a time.
+  /// Passes over the plain characters of a class that come next, eight at a time, and over line feeds where they mean no more
+  /// than these.
   template <CharacterClass PLAIN>
   void SkipPlain() noexcept {
     const char *next = m_next;
     for (;;) {
       next = SkipPlainWords<PLAIN>(next);
-      if (next == m_end || !IsOfClass(*next, PLAIN)) {
+      if (next == m_end) {
         break;
       }
-      ++next;
+      if (PLAIN != PLAIN_IN_VALUE && *next == '\n') {
+        BeginLine(++next);
+      } else if (IsOfClass(*next, PLAIN)) {
+        ++next;
+      } else {
+        break;
+      }
     }
     m_next = next;
   }
 
-  /// Passes over all characters of a class that come next. @return whether there was one.
-  bool SkipAll(CharacterClass characterClass) noexcept {
+  /// Passes over the white space that comes next. @return whether there was any.
+  bool SkipSpace() noexcept {
     const char *const begin = m_next;
-    const char *next = m_next;
-    while (next != m_end && IsOfClass(*next, characterClass)) {
-      ++next;
+    while (m_next != m_end && IsOfClass(*m_next, SPACE)) {
+      if (*m_next++ == '\n') {
+        BeginLine(m_next);
+      }
     }
-    m_next = next;
-    return next != begin;
+    return m_next != begin;
   }
 
   /// Passes over one character, which is not at the end, and which need not be ASCII.
@@ -171,7 +192,13 @@ public:
   void RequireAscii() noexcept { m_isAscii = true; }
 
   /// Passes over a name without a colon. @return whether one comes next.
-  bool SkipNcName();
+  bool SkipNcName() {
+    if (IsAtEnd() || !IsOfClass(*m_next, NAME_START)) {
+      return SkipNameBeyondAscii();
+    }
+    SkipNameCharacters();
+    return IsAtEnd() || static_cast<unsigned char>(*m_next) < 0x80 || SkipRestOfName();
+  }
 
   /// Passes over a name with at most one colon, which is between two names. @return an empty name when none comes next.
   /// @param atEnd the reason when the document ends behind the colon.
@@ -197,12 +224,30 @@ private:
     return next;
   }
 
+  void BeginLine(const char *place) noexcept {
+    ++m_line;
+    m_lineBegin = place;
+  }
+
+  /// Passes over those that are ASCII.
+  void SkipNameCharacters() noexcept {
+    const char *next = m_next;
+    while (next != m_end && IsOfClass(*next, NAME)) {
+      ++next;
+    }
+    m_next = next;
+  }
+
   void SkipUncommonCharacter();
+  bool SkipNameBeyondAscii();
+  bool SkipRestOfName();
   bool SkipNonAsciiNameCharacter(bool (*isAccepted)(std::uint32_t));
 
   std::string_view m_source;
   const char *m_next;
   const char *m_end;
+  const char *m_lineBegin;
+  std::uint32_t m_line = 1;
   bool m_isAscii = false;
 };
 
