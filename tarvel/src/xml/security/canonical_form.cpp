@@ -10,6 +10,8 @@
 #include <tarvel/xml/security/canonicalizer.h>
 #include <tarvel/xml/security/exceptions.h>
 
+#include <boost/container/small_vector.hpp>
+
 #include <algorithm>
 #include <functional>
 #include <tuple>
@@ -21,9 +23,6 @@ namespace {
 
 // Attributes are sorted by namespace name, so a long one would be compared again and again.
 constexpr std::size_t MAX_NAMESPACE_NAME_BYTES = 4096;
-
-constexpr std::size_t EXPECTED_DEPTH = 16;
-constexpr std::size_t EXPECTED_ATTRIBUTES = 8; // of one element
 
 constexpr std::string_view XML_NAMESPACE = "http://www.w3.org/XML/1998/namespace";
 constexpr std::string_view INCLUSIVE_WITH_LONE_NUMBER_SIGN = "http://www.w3.org/TR/2001/REC-xml-c14n-20010315#";
@@ -93,11 +92,7 @@ struct CanonicalAttribute {
 class CanonicalWalk {
 public:
   CanonicalWalk(const Node &apex, const CanonicalMethod &method, const Node *omitted, Writer &writer)
-      : m_apex(apex), m_method(method), m_omitted(omitted), m_output(writer) {
-    m_openElements.reserve(EXPECTED_DEPTH);
-    m_declarations.reserve(EXPECTED_ATTRIBUTES);
-    m_attributes.reserve(EXPECTED_ATTRIBUTES);
-  }
+      : m_apex(apex), m_method(method), m_omitted(omitted), m_output(writer) {}
 
   void Write();
 
@@ -136,9 +131,10 @@ private:
   const Node *const m_omitted;
   CanonicalOutput m_output;
   NamespaceBindings m_bindings;
-  std::vector<NamespaceBindings::Mark> m_openElements;
-  std::vector<std::size_t> m_declarations;      // of the element at hand, to be written
-  std::vector<CanonicalAttribute> m_attributes; // likewise
+  // With room for what a token needs, which then costs no allocation.
+  boost::container::small_vector<NamespaceBindings::Mark, 16> m_openElements;
+  boost::container::small_vector<std::size_t, 8> m_declarations;       // of the element at hand, to be written
+  boost::container::small_vector<CanonicalAttribute, 16> m_attributes; // likewise
   bool m_documentElementWritten = false;
 };
 
