@@ -3,6 +3,7 @@
 #include "xml/characters.h"
 
 #include <algorithm>
+#include <array>
 #include <cstdio>
 #include <cstring>
 #include <iterator>
@@ -30,6 +31,15 @@ bool IsIn(const Range (&ranges)[N], std::uint32_t character) noexcept {
   return std::any_of(std::begin(ranges), std::end(ranges),
                      [character](const Range &range) { return range.first <= character && character <= range.last; });
 }
+
+/// By byte: what nearly all names are made of.
+constexpr std::array<bool, 256> IS_ASCII_LETTER = [] {
+  std::array<bool, 256> letters{};
+  for (unsigned letter = 0; letter < 26; ++letter) {
+    letters['a' + letter] = letters['A' + letter] = true;
+  }
+  return letters;
+}();
 
 std::uint32_t Byte(std::string_view text, std::size_t offset) noexcept {
   return static_cast<unsigned char>(text[offset]);
@@ -187,6 +197,10 @@ std::string DescribeForbiddenCharacter(std::string_view what, std::string_view t
 bool IsNcName(std::string_view name) noexcept {
   std::size_t offset = 0;
   while (offset < name.size()) {
+    if (IS_ASCII_LETTER[Byte(name, offset)]) {
+      ++offset;
+      continue;
+    }
     const bool isFirst = offset == 0;
     const std::uint32_t character = ReadCharacter(name, offset);
     if (character == NO_CHARACTER || !(isFirst ? IsNameStart(character) : IsNameCharacter(character))) {
