@@ -60,12 +60,12 @@ void Explain(Peer peer, const Difference &difference, const EventText Reading::*
 } // namespace
 
 Comparison Compare(std::string_view document) {
-  const Reading ours = ReadWithPlatform(document);
+  Comparison comparison;
+  comparison.ours = ReadWithPlatform(document);
+  const Reading &ours = comparison.ours;
   const Reading libxml2 = ReadWithLibxml2(document);
   const Reading expat = ReadWithExpat(document);
   const Reading expatWithNamespaces = ReadWithNamespacesOfExpat(document);
-  Comparison comparison;
-  comparison.isAccepted = ours.isAccepted;
   const auto compareWith = [&](Peer peer, const Reading &theirs, const EventText Reading::*events) {
     if (!IsAlike(ours, theirs, events)) {
       Explain(peer, {document, ours, theirs, libxml2, expat}, events, comparison);

@@ -38,9 +38,9 @@ struct DifferenceRule {
 const std::vector<DifferenceRule> &DifferenceRules();
 
 struct Comparison {
+  Reading ours;
   std::vector<std::size_t> rules; ///< those that were needed, as places in `DifferenceRules()`
   std::string unexplained;        ///< a difference for which there is no rule; empty when there is none
-  bool isAccepted = false;        ///< by us
 };
 
 /// Reads `document` with everybody.

@@ -232,8 +232,9 @@ Reading ReadWithExpat(std::string_view document) {
   Run<&Reading::events>(session, document);
   Reading &reading = session.reading;
   reading.hasUnboundPrefix = session.rules.HasUnboundPrefix();
-  if (reading.isAccepted && !reading.hasDocumentType && !session.rules.GetFault().empty()) {
+  if (reading.isAccepted && !session.rules.GetFault().empty()) {
     reading.isAccepted = false;
+    reading.hasDocumentType = false;
     reading.code = NAMESPACE_FAULT;
     reading.message = session.rules.GetFault();
   }

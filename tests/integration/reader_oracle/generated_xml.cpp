@@ -716,6 +716,11 @@ std::string AtLimit(RandomSource &random) {
   }
 }
 
+// "<?xml version='1.0'?><a/>"
+constexpr std::string_view EBCDIC =
+    "\x4C\x6F\xA7\x94\x93\x40\xA5\x85\x99\xA2\x89\x96\x95\x7E\x7D\xF1\x4B\xF0\x7D\x6F\x6E"
+    "\x4C\x81\x61\x6E";
+
 /// ASCII only; other octets become characters of their own.
 std::string ToUtf16(std::string_view text, RandomSource &random) {
   const bool isBigEndian = random.OnceIn(2);
@@ -736,7 +741,7 @@ std::string GenerateXml(std::uint64_t seed) {
   }
   std::string text = random.OnceIn(12) ? TokenSoup(random) : Generator(random).Generate();
   if (random.OnceIn(400)) {
-    text = ToUtf16(text, random);
+    text = random.OnceIn(8) ? std::string(EBCDIC) : ToUtf16(text, random);
   }
   if (random.OnceIn(3)) {
     const std::string other = random.OnceIn(4) ? Generator(random).Generate() : TokenSoup(random);
