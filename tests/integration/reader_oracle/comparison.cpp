@@ -41,6 +41,14 @@ bool IsAlike(const Reading &ours, const Reading &theirs, const EventText Reading
   return !ours.isAccepted || (theirs.*events).Get() == (ours.*events).Get();
 }
 
+std::string Join(const std::vector<std::size_t> &numbers) {
+  std::string joined;
+  for (const std::size_t number : numbers) {
+    joined += " " + std::to_string(number);
+  }
+  return joined;
+}
+
 void Explain(Peer peer, const Difference &difference, const EventText Reading::*events, Comparison &comparison) {
   const std::vector<DifferenceRule> &rules = DifferenceRules();
   const auto rule = std::find_if(rules.begin(), rules.end(), [&](const DifferenceRule &candidate) {
@@ -73,6 +81,10 @@ Comparison Compare(std::string_view document) {
   };
   compareWith(Peer::LIBXML2, libxml2, &Reading::declarationsFirst);
   compareWith(Peer::EXPAT, expat, &Reading::events);
+  if (ours.isAccepted && expat.isAccepted && ours.offsets != expat.offsets) {
+    comparison.unexplained += "expat finds elements at" + Join(expat.offsets) + "\n    where the platform has them at" +
+                              Join(ours.offsets) + "\n    " + Escaped(document) + "\n";
+  }
   compareWith(Peer::EXPAT_WITH_NAMESPACES, expatWithNamespaces, &Reading::declarationsFirst);
   return comparison;
 }

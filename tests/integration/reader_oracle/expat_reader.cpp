@@ -220,6 +220,7 @@ Reading ReadWithExpat(std::string_view document) {
       parser.get(),
       [](void *self, const char *name, const char **attributes) {
         Self(self).rules.Start(name, attributes);
+        Self(self).reading.offsets.push_back(static_cast<std::size_t>(XML_GetCurrentByteIndex(Self(self).parser)));
         Self(self).reading.events.StartElement(name);
         for (; *attributes; attributes += 2) {
           Self(self).reading.events.Attribute(attributes[0], attributes[1]);
