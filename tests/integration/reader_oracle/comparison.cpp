@@ -55,7 +55,7 @@ void Explain(Peer peer, const Difference &difference, const EventText Reading::*
     return (candidate.peers & static_cast<unsigned>(peer)) != 0 && candidate.applies(difference);
   });
   if (rule != rules.end()) {
-    comparison.rules.push_back(static_cast<std::size_t>(rule - rules.begin()));
+    comparison.rules.push_back({static_cast<std::size_t>(rule - rules.begin()), peer});
     return;
   }
   const Reading &ours = difference.ours;

@@ -178,6 +178,8 @@ constexpr std::string_view COMMENT_PIECES[] = {"c", " ",  "<",  "&",   ">",  "\r
 constexpr std::string_view DATA_PIECES[] = {"d",    " ",        "?",   "??", ">",     "<", "&",
                                             "\r\n", "\xC3\xA4", "?x>", "--", "a='b'", "\t"};
 constexpr std::string_view SPACES[] = {" ", "  ", "\n", "\t", "\r\n", "\r", " \n\t"};
+constexpr std::string_view NO_SPACES[] = {"",         "\f",       "\v",           "\0"sv, "\x1F",
+                                          "\xC2\x85", "\xC2\xA0", "\xE2\x80\xA8", " \f",  "/"};
 constexpr std::string_view XML_ATTRIBUTES[] = {" xml:lang='en'",     " xml:lang=''",          " xml:space='preserve'",
                                                " xml:space='other'", " xml:base='http://e/'", " xml:id='a b'",
                                                " xml:id='a'",        " xml:other=\"1\""};
@@ -421,7 +423,12 @@ private:
     }
   }
 
-  std::string_view Space() { return m_random.OnceIn(4) ? m_random.OneOf(SPACES) : " "sv; }
+  std::string_view Space() {
+    if (IsOdd()) {
+      return m_random.OneOf(NO_SPACES);
+    }
+    return m_random.OnceIn(4) ? m_random.OneOf(SPACES) : " "sv;
+  }
 
   void PutOptionalSpace() {
     if (m_random.OnceIn(6)) {
@@ -484,7 +491,7 @@ private:
     const std::string target = Name();
     Put("<?" + target);
     if (!m_random.OnceIn(3)) {
-      Put(IsOdd() ? std::string_view() : Space());
+      Put(Space());
       PutPieces(DATA_PIECES);
       if (IsOdd()) {
         PutCharacter();
@@ -573,7 +580,7 @@ private:
   }
 
   void PutAttribute(const std::string &name, std::string_view value) {
-    Put(IsOdd() ? std::string_view() : Space());
+    Put(Space());
     Put(name);
     PutOptionalSpace();
     Put(IsOdd() ? "" : "=");

@@ -30,8 +30,8 @@ TEST(GeneratedDocuments, AreReadByAllReadersAlikeButForNamedDifferences) {
     const std::string document = Testing::GenerateXml(seed);
     const Comparison comparison = Compare(document);
     accepted += comparison.ours.isAccepted ? 1u : 0u;
-    for (const std::size_t rule : comparison.rules) {
-      ++counts[rule];
+    for (const Testing::AppliedRule &applied : comparison.rules) {
+      ++counts[applied.rule];
     }
     if (!comparison.unexplained.empty()) {
       ADD_FAILURE() << "document " << seed << ":\n" << comparison.unexplained;
