@@ -13,6 +13,7 @@
 #include <boost/container/small_vector.hpp>
 
 #include <algorithm>
+#include <compare>
 #include <functional>
 #include <tuple>
 #include <utility>
@@ -80,8 +81,8 @@ struct CanonicalAttribute {
   std::size_t height; // 0 for the element's own, else how far above it the attribute stands
 
   bool operator<(const CanonicalAttribute &other) const {
-    return std::tie(namespaceUri, localName, height) <=> std::tie(other.namespaceUri, other.localName, other.height) <
-           0;
+    return std::is_lt(std::tie(namespaceUri, localName, height) <=>
+                      std::tie(other.namespaceUri, other.localName, other.height));
   }
   bool HasNameOf(const CanonicalAttribute &other) const {
     return localName == other.localName && namespaceUri == other.namespaceUri;
