@@ -29,7 +29,7 @@ string(REGEX REPLACE "/$" "" ssoclient_pc_to_prefix "${ssoclient_pc_to_prefix}")
 # Static libraries are linked with what they rest on by the program that uses them; shared ones name it themselves.
 set(ssoclient_pc_requires "")
 if(NOT BUILD_SHARED_LIBS)
-  set(ssoclient_pc_requires "Requires: openssl >= 3.0, libxml-2.0 >= 2.9.14")
+  set(ssoclient_pc_requires "Requires: openssl >= 3.0")
 endif()
 foreach(name tarvel ssoclient)
   configure_file(cmake/${name}.pc.in ${PROJECT_BINARY_DIR}/${name}.pc @ONLY)

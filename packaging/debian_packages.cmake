@@ -1,6 +1,6 @@
 # SPDX-License-Identifier: Apache-2.0
 # `cpack` in a build with prefix /usr makes Debian packages: the libraries, what is needed to build against them, the
-# tool, the development token service, and, when it is built, the negotiation handler over the GSSAPI with what is needed to
+# tool, and, when they are built, the development token service and the negotiation handler over the GSSAPI with what is needed to
 # build against that. Needs dpkg-dev.
 
 set(CPACK_GENERATOR DEB)
@@ -14,7 +14,10 @@ set(CPACK_STRIP_FILES ON)
 
 set(CPACK_COMPONENTS_ALL runtime development)
 if(SSOCLIENT_BUILD_TOOLS)
-  list(APPEND CPACK_COMPONENTS_ALL tools devsts)
+  list(APPEND CPACK_COMPONENTS_ALL tools)
+endif()
+if(TARGET ssoclient_devsts)
+  list(APPEND CPACK_COMPONENTS_ALL devsts)
 endif()
 if(TARGET ssoclient_gssapi)
   list(APPEND CPACK_COMPONENTS_ALL gssapi gssapi-development)

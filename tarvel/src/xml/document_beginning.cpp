@@ -24,18 +24,18 @@ public:
 
   /// The value of the part `name`, or nothing when another part or the end comes next.
   std::optional<std::string_view> Read(std::string_view name) {
-    m_isAfterSpace = m_cursor.SkipAll(SPACE) || m_isAfterSpace;
+    m_isAfterSpace = m_cursor.SkipSpace() || m_isAfterSpace;
     if (!m_isAfterSpace || !m_cursor.Skip(name)) {
       return std::nullopt;
     }
     m_isAfterSpace = false;
-    m_cursor.SkipAll(SPACE);
+    m_cursor.SkipSpace();
     Require("=");
-    m_cursor.SkipAll(SPACE);
+    m_cursor.SkipSpace();
     const std::string_view quote = m_cursor.IsAt('\'') ? "'" : "\"";
     Require(quote);
     const char *const begin = m_cursor.GetPlace();
-    m_cursor.SkipAll(PLAIN_IN_VALUE);
+    m_cursor.SkipPlain<PLAIN_IN_VALUE>();
     const std::string_view value = m_cursor.GetFrom(begin);
     Require(quote);
     return value;
@@ -48,7 +48,7 @@ public:
   }
 
   void End() {
-    m_cursor.SkipAll(SPACE);
+    m_cursor.SkipSpace();
     Require("?>");
   }
 

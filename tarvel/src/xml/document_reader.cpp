@@ -9,7 +9,6 @@
 #include "xml/source_cursor.h"
 #include "xml/text_gatherer.h"
 
-#include <cstring>
 #include <string>
 #include <vector>
 
@@ -56,7 +55,6 @@ private:
   [[noreturn]] void RefuseEnd() const;
 
   void Count(const char *place);
-  SourcePosition AdvanceTo(const char *place) noexcept;
 
   SourceCursor m_cursor;
   XMLHandler &m_handler;
@@ -66,16 +64,10 @@ private:
   std::vector<OpenElement> m_open;
   std::size_t m_nodes = 0;
   bool m_hasElement = false;
-
-  // Lines are counted from one start tag to the next.
-  const char *m_lineBegin;
-  const char *m_counted;
-  std::uint32_t m_line = 1;
 };
 
 DocumentReader::DocumentReader(std::string_view source, XMLHandler &handler)
-    : m_cursor(source), m_handler(handler), m_gatherer(source.data() + source.size()), m_scope(m_cursor),
-      m_lineBegin(source.data() + GetByteOrderMarkLength(source)), m_counted(m_lineBegin) {
+    : m_cursor(source), m_handler(handler), m_gatherer(source.data() + source.size()), m_scope(m_cursor) {
   m_attributes.reserve(16);
   m_open.reserve(16);
 }
@@ -107,7 +99,7 @@ void DocumentReader::RefuseEnd() const {
 
 /// Reads white space or one piece of markup before or behind the document element.
 void DocumentReader::ReadOutside() {
-  if (m_cursor.SkipAll(SPACE)) {
+  if (m_cursor.SkipSpace()) {
     return;
   }
   if (m_cursor.IsAt(CDATA_BEGIN)) {
@@ -144,6 +136,7 @@ void DocumentReader::ReadMarkup() {
 
 void DocumentReader::ReadStartTag() {
   const char *const tag = m_cursor.GetPlace();
+  const SourcePosition position = m_cursor.GetPosition();
   if (m_open.size() == MAX_ELEMENT_DEPTH) {
     m_cursor.Refuse(Refusal::TOO_DEEP, tag);
   }
@@ -155,7 +148,6 @@ void DocumentReader::ReadStartTag() {
   }
   ReadAttributes(tag);
   const std::size_t declarations = m_scope.Enter(tag, name, m_attributes);
-  const SourcePosition position = AdvanceTo(tag);
   m_handler.StartElement(name.text, m_attributes.data(), m_attributes.size(), position.line, position.column);
   m_hasElement = true;
   m_open.push_back({name.text, position.line, declarations});
@@ -170,7 +162,7 @@ void DocumentReader::ReadStartTag() {
 void DocumentReader::ReadAttributes(const char *tag) {
   m_attributes.clear();
   for (;;) {
-    const bool isAfterSpace = m_cursor.SkipAll(SPACE);
+    const bool isAfterSpace = m_cursor.SkipSpace();
     if (m_cursor.IsAt('>') || m_cursor.IsAt("/>")) {
       return;
     }
@@ -195,11 +187,11 @@ void DocumentReader::ReadAttribute(const char *tag, bool isAfterSpace) {
     m_cursor.Refuse(Refusal::TOO_MANY_ATTRIBUTES, tag);
   }
   Count(begin);
-  m_cursor.SkipAll(SPACE);
+  m_cursor.SkipSpace();
   if (!m_cursor.Skip("=")) {
     m_cursor.RefuseNext(Refusal::ATTRIBUTE_WITHOUT_VALUE, Refusal::ENDS_IN_START_TAG, name.text);
   }
-  m_cursor.SkipAll(SPACE);
+  m_cursor.SkipSpace();
   m_attributes.push_back({name.text, ReadValue(name.text), name.prefixLength});
 }
 
@@ -212,7 +204,7 @@ std::string_view DocumentReader::ReadValue(std::string_view name) {
   m_cursor.Advance(1);
   m_gatherer.Begin(m_cursor.GetPlace());
   for (;;) {
-    m_cursor.SkipAll(PLAIN_IN_VALUE);
+    m_cursor.SkipPlain<PLAIN_IN_VALUE>();
     if (m_cursor.IsAtEnd()) {
       m_cursor.Refuse(Refusal::ENDS_IN_VALUE, m_cursor.GetPlace(), name);
     }
@@ -234,9 +226,12 @@ std::string_view DocumentReader::ReadValue(std::string_view name) {
       ReplaceCarriageReturn(" ");
       break;
     case '\t':
-    case '\n':
       m_gatherer.Replace(place, place + 1, " ");
       m_cursor.Advance(1);
+      break;
+    case '\n':
+      m_gatherer.Replace(place, place + 1, " ");
+      m_cursor.SkipLineFeed();
       break;
     default:
       m_cursor.SkipCharacter();
@@ -250,6 +245,10 @@ void DocumentReader::ReadEndTag() {
     m_cursor.Refuse(Refusal::END_TAG_WITHOUT_START_TAG, tag);
   }
   m_cursor.Advance(2);
+  if (m_cursor.Skip(m_open.back().name, '>')) { // as nearly all are
+    EndElement();
+    return;
+  }
   const WrittenName name = m_cursor.ReadName(Refusal::ENDS_IN_END_TAG);
   if (name.text.empty()) {
     m_cursor.RefuseNext(Refusal::NO_NAME_IN_END_TAG, Refusal::ENDS_IN_END_TAG);
@@ -257,7 +256,7 @@ void DocumentReader::ReadEndTag() {
   if (name.text != m_open.back().name && !m_cursor.IsAtEnd()) {
     m_cursor.Refuse(Refusal::OTHER_END_TAG, tag, m_open.back().name, std::to_string(m_open.back().line));
   }
-  m_cursor.SkipAll(SPACE);
+  m_cursor.SkipSpace();
   if (!m_cursor.Skip(">")) {
     m_cursor.RefuseNext(Refusal::MORE_IN_END_TAG, Refusal::ENDS_IN_END_TAG);
   }
@@ -275,7 +274,7 @@ void DocumentReader::ReadText() {
   const char *const begin = m_cursor.GetPlace();
   m_gatherer.Begin(begin);
   for (;;) {
-    m_cursor.SkipAll(PLAIN_IN_TEXT);
+    m_cursor.SkipPlain<PLAIN_IN_TEXT>();
     if (m_cursor.IsAtEnd()) {
       break;
     }
@@ -308,7 +307,7 @@ void DocumentReader::ReadCData() {
   m_cursor.Advance(CDATA_BEGIN.size());
   m_gatherer.Replace(begin, m_cursor.GetPlace(), "");
   for (;;) {
-    m_cursor.SkipAll(PLAIN_IN_MARKUP);
+    m_cursor.SkipPlain<PLAIN_IN_MARKUP>();
     if (m_cursor.IsAtEnd()) {
       m_cursor.Refuse(Refusal::ENDS_IN_CDATA, m_cursor.GetPlace());
     }
@@ -336,7 +335,7 @@ void DocumentReader::ReplaceReference() {
 void DocumentReader::ReplaceCarriageReturn(std::string_view by) {
   const char *const begin = m_cursor.GetPlace();
   m_cursor.Advance(1);
-  m_cursor.Skip("\n");
+  m_cursor.SkipLineFeed();
   m_gatherer.Replace(begin, m_cursor.GetPlace(), by);
 }
 
@@ -345,7 +344,7 @@ void DocumentReader::ReadComment() {
   m_cursor.Advance(COMMENT_BEGIN.size());
   m_gatherer.Begin(m_cursor.GetPlace());
   for (;;) {
-    m_cursor.SkipAll(PLAIN_IN_MARKUP);
+    m_cursor.SkipPlain<PLAIN_IN_MARKUP>();
     if (m_cursor.IsAtEnd()) {
       m_cursor.Refuse(Refusal::ENDS_IN_COMMENT, m_cursor.GetPlace());
     }
@@ -371,12 +370,12 @@ void DocumentReader::ReadComment() {
 void DocumentReader::ReadInstruction() {
   Count(m_cursor.GetPlace());
   const std::string_view target = ReadTarget();
-  if (!m_cursor.SkipAll(SPACE) && !m_cursor.IsAt(INSTRUCTION_END)) {
+  if (!m_cursor.SkipSpace() && !m_cursor.IsAt(INSTRUCTION_END)) {
     m_cursor.RefuseNext(Refusal::NO_SPACE_AFTER_TARGET, Refusal::ENDS_IN_INSTRUCTION);
   }
   m_gatherer.Begin(m_cursor.GetPlace());
   for (;;) {
-    m_cursor.SkipAll(PLAIN_IN_MARKUP);
+    m_cursor.SkipPlain<PLAIN_IN_MARKUP>();
     if (m_cursor.IsAtEnd()) {
       m_cursor.Refuse(Refusal::ENDS_IN_INSTRUCTION, m_cursor.GetPlace());
     }
@@ -425,16 +424,6 @@ void DocumentReader::Count(const char *place) {
     m_cursor.Refuse(Refusal::TOO_MANY_NODES, place);
   }
   ++m_nodes;
-}
-
-/// Line and column of `place`, which is never before that of the last call.
-SourcePosition DocumentReader::AdvanceTo(const char *place) noexcept {
-  while (const void *const lineBreak = std::memchr(m_counted, '\n', static_cast<std::size_t>(place - m_counted))) {
-    ++m_line;
-    m_lineBegin = m_counted = static_cast<const char *>(lineBreak) + 1;
-  }
-  m_counted = place;
-  return {m_line, static_cast<std::uint32_t>(1 + (place - m_lineBegin))};
 }
 
 } // namespace

@@ -9,6 +9,7 @@
 #include <tarvel/core/exception.h>
 #include <tarvel/core/string_util.h>
 
+#include <algorithm>
 #include <string>
 #include <utility>
 
@@ -192,14 +193,19 @@ void ElementNode::DefineAttribute(std::string_view qualifiedName, std::string_vi
   if (!refusal.empty()) {
     throw InvalidArgumentException("the value of the attribute '" + StringUtil::Shorten(qualifiedName) + "'" + refusal);
   }
-  for (Attribute *attribute = m_firstAttribute; attribute; attribute = attribute->m_next) {
-    if (attribute->m_name == qualifiedName) {
-      attribute->m_value = m_arena->Copy(value);
+  AttributeEnd end{&m_firstAttribute, &m_firstDeclaration};
+  for (; *end.next; end.next = &(*end.next)->m_next) {
+    Attribute &attribute = **end.next;
+    if (attribute.m_name == qualifiedName) {
+      attribute.m_value = m_arena->Copy(value);
       return;
+    }
+    if (attribute.m_isNamespaceDeclaration) {
+      end.nextDeclaration = &attribute.m_nextDeclaration;
     }
   }
   const std::string_view name = m_arena->Copy(qualifiedName);
-  AppendAttribute(name, hasPrefix ? colon : 0, m_arena->Copy(value));
+  AppendAttribute(end, name, hasPrefix ? colon : 0, m_arena->Copy(value));
 }
 
 ElementNode *ElementNode::AppendElement(std::string_view prefix, std::string_view localName) {
@@ -218,22 +224,23 @@ void ElementNode::AppendText(std::string_view value) {
 }
 
 void ElementNode::SetName(std::string_view name) noexcept {
-  const std::size_t colon = name.find(':');
+  const auto colon = std::find(name.begin(), name.end(), ':');
   m_name = name;
-  m_prefixLength = colon == std::string_view::npos ? 0 : static_cast<std::uint32_t>(colon);
+  m_prefixLength = colon == name.end() ? 0 : static_cast<std::uint32_t>(colon - name.begin());
 }
 
-void ElementNode::AppendAttribute(std::string_view name, std::size_t prefixLength, std::string_view value) {
+void ElementNode::AppendAttribute(AttributeEnd &end, std::string_view name, std::size_t prefixLength,
+                                  std::string_view value) {
   Attribute *const attribute = m_arena->New<Attribute>();
   attribute->m_name = name;
   attribute->m_value = value;
   attribute->m_prefixLength = static_cast<std::uint32_t>(prefixLength);
   attribute->m_isNamespaceDeclaration = (prefixLength ? name.substr(0, prefixLength) : name) == "xmlns";
-  (m_lastAttribute ? m_lastAttribute->m_next : m_firstAttribute) = attribute;
-  m_lastAttribute = attribute;
+  *end.next = attribute;
+  end.next = &attribute->m_next;
   if (attribute->m_isNamespaceDeclaration) {
-    (m_lastDeclaration ? m_lastDeclaration->m_nextDeclaration : m_firstDeclaration) = attribute;
-    m_lastDeclaration = attribute;
+    *end.nextDeclaration = attribute;
+    end.nextDeclaration = &attribute->m_nextDeclaration;
   }
 }
 

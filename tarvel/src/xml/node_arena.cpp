@@ -77,14 +77,9 @@ void NodeArena::Join(NodeArena *a, NodeArena *b) noexcept {
   smaller->m_leader = larger;
 }
 
-void *NodeArena::Allocate(std::size_t size) {
-  char *begin = m_free + (-reinterpret_cast<std::uintptr_t>(m_free) & (ALIGNMENT - 1));
-  if (begin > m_end || static_cast<std::size_t>(m_end - begin) < size) {
-    AddBlock(size);
-    begin = m_free;
-  }
-  m_free = begin + size;
-  return begin;
+void *NodeArena::AllocateInNewBlock(std::size_t size) {
+  AddBlock(size);
+  return std::exchange(m_free, m_free + size);
 }
 
 std::string_view NodeArena::Copy(std::string_view text) {

@@ -74,7 +74,15 @@ private:
   NodeArena(std::size_t firstBytes, AfterUse afterUse) noexcept;
   ~NodeArena();
 
-  void *Allocate(std::size_t size);
+  void *Allocate(std::size_t size) {
+    char *const begin = m_free + (-reinterpret_cast<std::uintptr_t>(m_free) & (ALIGNMENT - 1));
+    if (begin > m_end || static_cast<std::size_t>(m_end - begin) < size) {
+      return AllocateInNewBlock(size);
+    }
+    m_free = begin + size;
+    return begin;
+  }
+  void *AllocateInNewBlock(std::size_t size);
   char *AllocateText(std::size_t size);
   void AddBlock(std::size_t size);
   char *AllocateBlock(std::size_t size);

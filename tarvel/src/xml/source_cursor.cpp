@@ -41,17 +41,13 @@ bool SourceCursor::SkipNonAsciiNameCharacter(bool (*isAccepted)(std::uint32_t)) 
   return true;
 }
 
-bool SourceCursor::SkipNcName() {
-  if (IsAtEnd()) {
-    return false;
-  }
-  if (IsOfClass(*m_next, NAME_START)) {
-    ++m_next;
-  } else if (!SkipNonAsciiNameCharacter(&IsNameStart)) {
-    return false;
-  }
+bool SourceCursor::SkipNameBeyondAscii() {
+  return SkipNonAsciiNameCharacter(&IsNameStart) && SkipRestOfName();
+}
+
+bool SourceCursor::SkipRestOfName() {
   do {
-    SkipAll(NAME);
+    SkipNameCharacters();
   } while (SkipNonAsciiNameCharacter(&IsNameCharacter));
   return true;
 }

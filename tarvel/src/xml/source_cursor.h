@@ -7,6 +7,7 @@
 #include "xml/refusals.h"
 
 #include <array>
+#include <bit>
 #include <cstddef>
 #include <cstdint>
 #include <cstring>
@@ -22,9 +23,9 @@ enum CharacterClass : std::uint8_t {
   SPACE = 1,            // S, production 3
   NAME_START = 2,       // NameStartChar without the colon
   NAME = 4,             // NameChar without the colon
-  PLAIN_IN_TEXT = 8,    // all but '<', '&', ']' and CR
+  PLAIN_IN_TEXT = 8,    // all but '<', '&', ']' and line ends
   PLAIN_IN_VALUE = 16,  // all but '<', '&', quotation marks and white space other than spaces
-  PLAIN_IN_MARKUP = 32, // in comments, instructions and CDATA sections: all but '-', ']', '?' and CR
+  PLAIN_IN_MARKUP = 32, // in comments, instructions and CDATA sections: all but '-', ']', '?' and line ends
 };
 
 constexpr std::array<std::uint8_t, 256> MakeCharacterClasses() noexcept {
@@ -37,9 +38,9 @@ constexpr std::array<std::uint8_t, 256> MakeCharacterClasses() noexcept {
     const bool isAccepted = code >= 0x20 || isOneOf(c, "\t\r\n");
     classes[code] =
         static_cast<std::uint8_t>((isOneOf(c, " \t\r\n") ? SPACE : 0) | (isLetter ? NAME_START : 0) |
-                                  (isInName ? NAME : 0) | (isAccepted && !isOneOf(c, "<&]\r") ? PLAIN_IN_TEXT : 0) |
+                                  (isInName ? NAME : 0) | (isAccepted && !isOneOf(c, "<&]\r\n") ? PLAIN_IN_TEXT : 0) |
                                   (isAccepted && !isOneOf(c, "<&\"'\t\r\n") ? PLAIN_IN_VALUE : 0) |
-                                  (isAccepted && !isOneOf(c, "-]?\r") ? PLAIN_IN_MARKUP : 0));
+                                  (isAccepted && !isOneOf(c, "-]?\r\n") ? PLAIN_IN_MARKUP : 0));
   }
   return classes;
 }
@@ -48,6 +49,28 @@ constexpr std::array<std::uint8_t, 256> CHARACTER_CLASSES = MakeCharacterClasses
 
 constexpr bool IsOfClass(char character, CharacterClass characterClass) noexcept {
   return (CHARACTER_CLASSES[static_cast<unsigned char>(character)] & characterClass) != 0;
+}
+
+/// The high bits of those bytes of `word` that may not be plain: control characters, what is not ASCII, and what the class
+/// leaves out. A bit is right at least up to the first byte in memory that is set where the lowest byte comes first.
+template <CharacterClass PLAIN>
+constexpr std::uint64_t MarkDoubtfulBytes(std::uint64_t word) noexcept {
+  constexpr std::uint64_t EACH = 0x0101010101010101;
+  constexpr std::uint64_t HIGH_BITS = 0x80 * EACH;
+  const auto marksOf = [word](char c) {
+    const std::uint64_t zeroWhereEqual = word ^ EACH * static_cast<unsigned char>(c);
+    return (zeroWhereEqual - EACH) & ~zeroWhereEqual;
+  };
+  std::uint64_t marks = word | ((word - 0x20 * EACH) & ~word);
+  if constexpr (PLAIN == PLAIN_IN_TEXT) {
+    marks |= marksOf('<') | marksOf('&') | marksOf(']');
+  } else if constexpr (PLAIN == PLAIN_IN_VALUE) {
+    marks |= marksOf('<') | marksOf('&') | marksOf('"') | marksOf('\'');
+  } else {
+    static_assert(PLAIN == PLAIN_IN_MARKUP);
+    marks |= marksOf('-') | marksOf(']') | marksOf('?');
+  }
+  return marks & HIGH_BITS;
 }
 
 /// A name as written, and where its prefix ends.
@@ -64,7 +87,8 @@ class SourceCursor {
 public:
   /// @param source outlives the cursor.
   explicit SourceCursor(std::string_view source) noexcept
-      : m_source(source), m_next(source.data()), m_end(source.data() + source.size()) {}
+      : m_source(source), m_next(source.data()), m_end(source.data() + source.size()),
+        m_lineBegin(source.data() + GetByteOrderMarkLength(source)) {}
 
   bool IsAtEnd() const noexcept { return m_next == m_end; }
 
@@ -87,29 +111,70 @@ public:
     return isNotAfter(m_source.data(), text.data()) && isNotAfter(text.data() + text.size(), m_end);
   }
 
+  /// Line and column of what comes next.
+  SourcePosition GetPosition() const noexcept {
+    return {m_line, static_cast<std::uint32_t>(1 + (m_next - m_lineBegin))};
+  }
+
   /// The text from `begin` to here.
   std::string_view GetFrom(const char *begin) const noexcept {
     return std::string_view(begin, static_cast<std::size_t>(m_next - begin));
   }
 
+  /// Passes over that many bytes, none of which is a line feed.
   void Advance(std::size_t bytes) noexcept { m_next += bytes; }
 
-  /// Passes over `literal` if it comes next. @return whether it does.
+  /// Passes over a line feed if one comes next.
+  void SkipLineFeed() noexcept {
+    if (IsAt('\n')) {
+      BeginLine(++m_next);
+    }
+  }
+
+  /// Passes over `literal`, which has no line feed, if it comes next. @return whether it does.
   bool Skip(std::string_view literal) noexcept {
     const bool isHere = IsAt(literal);
     m_next += isHere ? literal.size() : 0;
     return isHere;
   }
 
-  /// Passes over all characters of a class that come next. @return whether there was one.
-  bool SkipAll(CharacterClass characterClass) noexcept {
-    const char *const begin = m_next;
+  /// Passes over `literal` with `last` behind it if both come next. @return whether they do.
+  bool Skip(std::string_view literal, char last) noexcept {
+    const bool isHere = GetRemaining() > literal.size() && m_next[literal.size()] == last && IsAt(literal);
+    m_next += isHere ? literal.size() + 1 : 0;
+    return isHere;
+  }
+
+  /// Passes over the plain characters of a class that come next, eight at a time, and over line feeds where they mean no more
+  /// than these.
+  template <CharacterClass PLAIN>
+  void SkipPlain() noexcept {
     const char *next = m_next;
-    while (next != m_end && IsOfClass(*next, characterClass)) {
-      ++next;
+    for (;;) {
+      next = SkipPlainWords<PLAIN>(next);
+      if (next == m_end) {
+        break;
+      }
+      if (PLAIN != PLAIN_IN_VALUE && *next == '\n') {
+        BeginLine(++next);
+      } else if (IsOfClass(*next, PLAIN)) {
+        ++next;
+      } else {
+        break;
+      }
     }
     m_next = next;
-    return next != begin;
+  }
+
+  /// Passes over the white space that comes next. @return whether there was any.
+  bool SkipSpace() noexcept {
+    const char *const begin = m_next;
+    while (m_next != m_end && IsOfClass(*m_next, SPACE)) {
+      if (*m_next++ == '\n') {
+        BeginLine(m_next);
+      }
+    }
+    return m_next != begin;
   }
 
   /// Passes over one character, which is not at the end, and which need not be ASCII.
@@ -127,7 +192,13 @@ public:
   void RequireAscii() noexcept { m_isAscii = true; }
 
   /// Passes over a name without a colon. @return whether one comes next.
-  bool SkipNcName();
+  bool SkipNcName() {
+    if (IsAtEnd() || !IsOfClass(*m_next, NAME_START)) {
+      return SkipNameBeyondAscii();
+    }
+    SkipNameCharacters();
+    return IsAtEnd() || static_cast<unsigned char>(*m_next) < 0x80 || SkipRestOfName();
+  }
 
   /// Passes over a name with at most one colon, which is between two names. @return an empty name when none comes next.
   /// @param atEnd the reason when the document ends behind the colon.
@@ -140,12 +211,43 @@ public:
                            std::string_view alsoFound = {}) const;
 
 private:
+  /// The first byte at `next` or behind it that is not plain for sure, or one of the last bytes of the text.
+  template <CharacterClass PLAIN>
+  const char *SkipPlainWords(const char *next) const noexcept {
+    for (std::uint64_t word = 0; m_end - next >= static_cast<std::ptrdiff_t>(sizeof word); next += sizeof word) {
+      std::memcpy(&word, next, sizeof word);
+      const std::uint64_t marks = MarkDoubtfulBytes<PLAIN>(word);
+      if (marks) {
+        return std::endian::native == std::endian::little ? next + std::countr_zero(marks) / 8 : next;
+      }
+    }
+    return next;
+  }
+
+  void BeginLine(const char *place) noexcept {
+    ++m_line;
+    m_lineBegin = place;
+  }
+
+  /// Passes over those that are ASCII.
+  void SkipNameCharacters() noexcept {
+    const char *next = m_next;
+    while (next != m_end && IsOfClass(*next, NAME)) {
+      ++next;
+    }
+    m_next = next;
+  }
+
   void SkipUncommonCharacter();
+  bool SkipNameBeyondAscii();
+  bool SkipRestOfName();
   bool SkipNonAsciiNameCharacter(bool (*isAccepted)(std::uint32_t));
 
   std::string_view m_source;
   const char *m_next;
   const char *m_end;
+  const char *m_lineBegin;
+  std::uint32_t m_line = 1;
   bool m_isAscii = false;
 };
 

@@ -57,8 +57,9 @@ void TreeBuilder::StartElement(std::string_view name, const AttributeEvent *attr
   element->SetName(Store(name));
   element->m_line = line;
   element->m_column = column;
+  ElementNode::AttributeEnd end{&element->m_firstAttribute, &element->m_firstDeclaration};
   for (std::size_t i = 0; i < count; ++i) {
-    element->AppendAttribute(Store(attributes[i].name), attributes[i].prefixLength, Store(attributes[i].value));
+    element->AppendAttribute(end, Store(attributes[i].name), attributes[i].prefixLength, Store(attributes[i].value));
   }
   m_current->AppendNode(element);
   m_current = element;

@@ -17,8 +17,7 @@
 
 #include <gtest/gtest.h>
 
-#include <atomic>
-#include <chrono>
+#include <functional>
 #include <string>
 #include <string_view>
 #include <thread>
@@ -30,9 +29,10 @@ using Testing::Gate;
 using Testing::RunInChild;
 
 /// What the child of a parent does whose other thread waits at `gate`: the fork returns, and the child goes its way.
-void ExpectForkWhileHeldAt(Gate &gate) {
+void ExpectForkWhileHeldAt(
+    Gate &gate, const std::function<void()> &inChild = [] {}) {
   ASSERT_TRUE(gate.WaitForArrivals(1));
-  EXPECT_EQ(RunInChild([] {}), "");
+  EXPECT_EQ(RunInChild(inChild), "");
   gate.Open();
 }
 
@@ -92,19 +92,14 @@ TEST(ForkBesideTheHostsCode, DoesNotWaitForTheCompletionOfARequest) {
   EXPECT_EQ(response->GetStatusCode(), 200);
 }
 
-/// A handler that is called in the midst of a parse and stays there until somebody waits in fork.
-class SlowHandler final : public Xml::XMLHandler {
+/// A handler that is held in the midst of a parse.
+class HeldHandler final : public Xml::XMLHandler {
 public:
-  SlowHandler(Testing::EventCount &begun, std::atomic<bool> &over) : m_begun(begun), m_over(over) {}
+  explicit HeldHandler(Gate &gate) : m_gate(gate) {}
 
   void StartDocument(std::string_view, const Ref<Object> &) override {}
   void StartElement(std::string_view, const Xml::AttributeEvent *, std::size_t, std::uint32_t, std::uint32_t) override {
-    m_begun.Add();
-    while (!System::IsForkUnderWay()) {
-      std::this_thread::yield();
-    }
-    std::this_thread::sleep_for(std::chrono::milliseconds(20)); // which a fork that does not wait does not take
-    m_over = true;
+    m_gate.Pass();
   }
   void EndElement() override {}
   void Characters(std::string_view) override {}
@@ -113,17 +108,17 @@ public:
   Ref<Object> TakeResult() override { return {}; }
 
 private:
-  Testing::EventCount &m_begun;
-  std::atomic<bool> &m_over;
+  Gate &m_gate;
 };
 
-TEST(ForkBesideOurOwnCode, WaitsForTheEndOfAParse) {
-  Testing::EventCount begun;
-  std::atomic<bool> over{false};
-  std::thread parsing(
-      [&] { Xml::CreateXMLParser(MakeRef<SlowHandler>(begun, over))->Parse(*CreateStringReader("<a/>")); });
-  ASSERT_TRUE(begun.WaitFor(1));
-  EXPECT_EQ(RunInChild([&] { EXPECT_TRUE(over); }), "");
+Ref<Object> Parse(const Ref<Xml::XMLHandler> &handler) {
+  return Xml::CreateXMLParser(handler)->Parse(*CreateStringReader("<a/>"));
+}
+
+TEST(ForkBesideTheHostsCode, DoesNotWaitForTheHandlerOfAParse) {
+  Gate gate;
+  std::thread parsing([&gate] { Parse(MakeRef<HeldHandler>(gate)); });
+  ExpectForkWhileHeldAt(gate, [] { EXPECT_TRUE(Parse(Xml::CreateXMLDocumentHandler())); });
   parsing.join();
 }
 

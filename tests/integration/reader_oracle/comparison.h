@@ -37,10 +37,15 @@ struct DifferenceRule {
 
 const std::vector<DifferenceRule> &DifferenceRules();
 
+struct AppliedRule {
+  std::size_t rule; ///< its place in `DifferenceRules()`
+  Peer peer;
+};
+
 struct Comparison {
-  std::vector<std::size_t> rules; ///< those that were needed, as places in `DifferenceRules()`
+  Reading ours;
+  std::vector<AppliedRule> rules; ///< those that were needed
   std::string unexplained;        ///< a difference for which there is no rule; empty when there is none
-  bool isAccepted = false;        ///< by us
 };
 
 /// Reads `document` with everybody.

@@ -95,7 +95,8 @@ bool HasTooManyDeclarations(const Difference &difference) {
 
 bool IsNameOfFifthEdition(const Difference &difference) {
   return OnlyTheyRefuse(difference) && difference.theirs.code == XML_ERROR_INVALID_TOKEN &&
-         BeginsWithNameCharacter(difference.document.substr(difference.theirs.offset));
+         BeginsWithNameCharacter(
+             difference.document.substr(std::min(difference.theirs.offset, difference.document.size())));
 }
 
 bool IsUnboundPrefix(const Difference &difference) {
@@ -140,6 +141,11 @@ bool HasPortThatIsNoInt(const Difference &difference) {
   return port == ":" || (port.size() > 10 && port.find_first_not_of("0123456789", 1) == NPOS);
 }
 
+bool IsEbcdic(const Difference &difference) {
+  return OnlyWeRefuseAs(difference, "text comes before the document element") &&
+         difference.document.starts_with("\x4C\x6F\xA7\x94"); // "<?xm"
+}
+
 bool IsNullByte(const Difference &difference) {
   return OnlyWeRefuseAs(difference, "the document holds a null byte") && FromOurPosition(difference)[0] == '\0';
 }
@@ -172,6 +178,7 @@ const std::vector<DifferenceRule> &DifferenceRules() {
       {"expat knows the names of the fourth edition only", BOTH_OF_EXPAT, IsNameOfFifthEdition},
       {"expat refuses an unbound prefix", EXPAT_WITH_NAMESPACES, IsUnboundPrefix},
       {"expat does not judge whether a namespace name is a URI", BOTH_OF_EXPAT, IsNamespaceNameThatIsNoUri},
+      {"libxml2 reads EBCDIC", LIBXML2, IsEbcdic},
       {"libxml2 ends at a null byte", LIBXML2, IsNullByte},
       {"libxml2 takes the prefix xmlns on an element for an unbound one", LIBXML2, IsPrefixXmlnsOnElement},
       {"libxml2 takes anything in brackets for an address in a namespace name", LIBXML2, HasAddressInBrackets},

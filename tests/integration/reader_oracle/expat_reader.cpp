@@ -220,6 +220,7 @@ Reading ReadWithExpat(std::string_view document) {
       parser.get(),
       [](void *self, const char *name, const char **attributes) {
         Self(self).rules.Start(name, attributes);
+        Self(self).reading.offsets.push_back(static_cast<std::size_t>(XML_GetCurrentByteIndex(Self(self).parser)));
         Self(self).reading.events.StartElement(name);
         for (; *attributes; attributes += 2) {
           Self(self).reading.events.Attribute(attributes[0], attributes[1]);
@@ -232,8 +233,9 @@ Reading ReadWithExpat(std::string_view document) {
   Run<&Reading::events>(session, document);
   Reading &reading = session.reading;
   reading.hasUnboundPrefix = session.rules.HasUnboundPrefix();
-  if (reading.isAccepted && !reading.hasDocumentType && !session.rules.GetFault().empty()) {
+  if (reading.isAccepted && !session.rules.GetFault().empty()) {
     reading.isAccepted = false;
+    reading.hasDocumentType = false;
     reading.code = NAMESPACE_FAULT;
     reading.message = session.rules.GetFault();
   }

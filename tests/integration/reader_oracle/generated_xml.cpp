@@ -178,6 +178,8 @@ constexpr std::string_view COMMENT_PIECES[] = {"c", " ",  "<",  "&",   ">",  "\r
 constexpr std::string_view DATA_PIECES[] = {"d",    " ",        "?",   "??", ">",     "<", "&",
                                             "\r\n", "\xC3\xA4", "?x>", "--", "a='b'", "\t"};
 constexpr std::string_view SPACES[] = {" ", "  ", "\n", "\t", "\r\n", "\r", " \n\t"};
+constexpr std::string_view NO_SPACES[] = {"",         "\f",       "\v",           "\0"sv, "\x1F",
+                                          "\xC2\x85", "\xC2\xA0", "\xE2\x80\xA8", " \f",  "/"};
 constexpr std::string_view XML_ATTRIBUTES[] = {" xml:lang='en'",     " xml:lang=''",          " xml:space='preserve'",
                                                " xml:space='other'", " xml:base='http://e/'", " xml:id='a b'",
                                                " xml:id='a'",        " xml:other=\"1\""};
@@ -386,7 +388,8 @@ std::string Utf8(std::uint32_t c) {
 
 class Generator {
 public:
-  explicit Generator(RandomSource &random) : m_random(random), m_oddity(OneNumberOf({0, 0, 0, 150, 60, 25, 8})) {}
+  explicit Generator(RandomSource &random)
+      : m_random(random), m_oddity(OneNumberOf({0, 0, 0, 150, 60, 25, 8})), m_isNarrow(random.OnceIn(8)) {}
 
   std::string Generate() {
     if (m_random.OnceIn(12)) {
@@ -421,7 +424,12 @@ private:
     }
   }
 
-  std::string_view Space() { return m_random.OnceIn(4) ? m_random.OneOf(SPACES) : " "sv; }
+  std::string_view Space() {
+    if (IsOdd()) {
+      return m_random.OneOf(NO_SPACES);
+    }
+    return m_random.OnceIn(4) ? m_random.OneOf(SPACES) : " "sv;
+  }
 
   void PutOptionalSpace() {
     if (m_random.OnceIn(6)) {
@@ -436,6 +444,9 @@ private:
   }
 
   std::string Name() {
+    if (m_isNarrow) {
+      return std::string(NAMES[m_random.Below(2)]);
+    }
     if (IsOdd()) {
       return std::string(m_random.OneOf(ODD_NAMES));
     }
@@ -446,11 +457,16 @@ private:
     return std::string(m_random.OneOf(NAMES));
   }
 
+  std::string Prefix() { return std::string(m_isNarrow ? PREFIXES[m_random.Below(3)] : m_random.OneOf(PREFIXES)); }
+
   std::string QualifiedName() {
+    if (m_isNarrow && m_random.OnceIn(2)) {
+      return Prefix() + ":" + Name();
+    }
     if (m_random.OnceIn(3) && !m_declared.empty()) {
       return m_declared[m_random.Below(m_declared.size())] + ":" + Name();
     }
-    return m_random.OnceIn(40) ? std::string(m_random.OneOf(PREFIXES)) + ":" + Name() : Name();
+    return m_random.OnceIn(40) ? Prefix() + ":" + Name() : Name();
   }
 
   void PutCharacter() {
@@ -484,7 +500,7 @@ private:
     const std::string target = Name();
     Put("<?" + target);
     if (!m_random.OnceIn(3)) {
-      Put(IsOdd() ? std::string_view() : Space());
+      Put(Space());
       PutPieces(DATA_PIECES);
       if (IsOdd()) {
         PutCharacter();
@@ -573,7 +589,7 @@ private:
   }
 
   void PutAttribute(const std::string &name, std::string_view value) {
-    Put(IsOdd() ? std::string_view() : Space());
+    Put(Space());
     Put(name);
     PutOptionalSpace();
     Put(IsOdd() ? "" : "=");
@@ -581,53 +597,69 @@ private:
     PutValue(value);
   }
 
-  void PutStartTag(const std::string &name, std::vector<std::string> &declared) {
-    Put("<" + name);
+  struct WrittenAttribute {
+    std::string name;
+    std::string value;
+  };
+
+  void AddDeclarations(std::vector<WrittenAttribute> &attributes) {
     for (std::size_t count = m_random.OnceIn(2) ? 0 : m_random.Below(4); count != 0; --count) {
-      const bool isDefault = m_random.OnceIn(4);
-      const std::string prefix(m_random.OneOf(PREFIXES));
-      bool isTwice = false;
-      for (const std::string &other : declared) {
-        isTwice = isTwice || other == (isDefault ? "" : prefix);
-      }
-      if (isTwice && !IsOdd()) {
-        continue;
-      }
-      declared.push_back(isDefault ? "" : prefix);
+      const std::string prefix = m_random.OnceIn(4) ? "" : Prefix();
       const bool isOddName = IsOdd() || m_random.OnceIn(16);
-      PutAttribute(isDefault ? "xmlns" : "xmlns:" + prefix,
-                   isOddName ? m_random.OneOf(ODD_NAMESPACES) : m_random.OneOf(NAMESPACES));
+      if (Add(prefix.empty() ? "xmlns" : "xmlns:" + prefix,
+              isOddName    ? m_random.OneOf(ODD_NAMESPACES)
+              : m_isNarrow ? NAMESPACES[m_random.Below(2)]
+                           : m_random.OneOf(NAMESPACES),
+              attributes) &&
+          !prefix.empty()) {
+        m_declared.push_back(prefix);
+      }
+    }
+  }
+
+  void AddAttributes(std::vector<WrittenAttribute> &attributes) {
+    for (std::size_t count = m_random.Below(m_random.OnceIn(20) ? 24 : 4); count != 0; --count) {
+      Add(QualifiedName(), AttributeValue(), attributes);
+    }
+    if (m_random.OnceIn(30)) {
+      Add("xmlns:xml", "http://www.w3.org/XML/1998/namespace", attributes);
+    }
+  }
+
+  /// Adds an attribute; one whose name is there already only now and then.
+  bool Add(const std::string &name, std::string_view value, std::vector<WrittenAttribute> &attributes) {
+    const bool isTwice = std::any_of(attributes.begin(), attributes.end(),
+                                     [&](const WrittenAttribute &other) { return other.name == name; });
+    if (isTwice && !IsOdd()) {
+      return false;
+    }
+    const auto place = static_cast<std::ptrdiff_t>(m_random.Below(attributes.size() + 1));
+    attributes.insert(attributes.begin() + place, {name, std::string(value)});
+    return true;
+  }
+
+  /// @return the name.
+  std::string PutStartTag() {
+    std::vector<WrittenAttribute> attributes;
+    AddDeclarations(attributes);
+    const std::string name = QualifiedName();
+    AddAttributes(attributes);
+    Put("<" + name);
+    for (const WrittenAttribute &attribute : attributes) {
+      PutAttribute(attribute.name, attribute.value);
     }
     if (m_random.OnceIn(12)) {
       Put(m_random.OneOf(XML_ATTRIBUTES));
     }
-    if (m_random.OnceIn(30)) {
-      Put(" xmlns:xml='http://www.w3.org/XML/1998/namespace'");
-    }
-    std::vector<std::string> names;
-    for (std::size_t count = m_random.Below(4); count != 0; --count) {
-      const std::string attribute = QualifiedName();
-      if (std::find(names.begin(), names.end(), attribute) == names.end() || IsOdd()) {
-        names.push_back(attribute);
-        PutAttribute(attribute, AttributeValue());
-      }
-    }
     PutOptionalSpace();
+    return name;
   }
 
   // The depth is bounded by MAX_DEPTH.
   void PutElement(std::size_t depth) {
     ++m_elements;
     const std::size_t outside = m_declared.size();
-    std::vector<std::string> declared;
-    // A start tag may use what it declares: the names are made afterwards.
-    const std::string name = QualifiedName();
-    PutStartTag(name, declared);
-    for (const std::string &prefix : declared) {
-      if (!prefix.empty()) {
-        m_declared.push_back(prefix);
-      }
-    }
+    const std::string name = PutStartTag();
     if (m_random.OnceIn(4)) {
       Put(IsOdd() ? "/ >" : "/>");
       m_declared.resize(outside);
@@ -664,6 +696,7 @@ private:
 
   RandomSource &m_random;
   const std::size_t m_oddity; // one in so many things is odd; 0: none
+  const bool m_isNarrow;      // few prefixes, namespaces and names, so that they meet
   std::size_t m_elements = 0;
   std::vector<std::string> m_declared; // prefixes in scope
   std::string m_text;
@@ -716,6 +749,11 @@ std::string AtLimit(RandomSource &random) {
   }
 }
 
+// "<?xml version='1.0'?><a/>"
+constexpr std::string_view EBCDIC =
+    "\x4C\x6F\xA7\x94\x93\x40\xA5\x85\x99\xA2\x89\x96\x95\x7E\x7D\xF1\x4B\xF0\x7D\x6F\x6E"
+    "\x4C\x81\x61\x6E";
+
 /// ASCII only; other octets become characters of their own.
 std::string ToUtf16(std::string_view text, RandomSource &random) {
   const bool isBigEndian = random.OnceIn(2);
@@ -736,7 +774,7 @@ std::string GenerateXml(std::uint64_t seed) {
   }
   std::string text = random.OnceIn(12) ? TokenSoup(random) : Generator(random).Generate();
   if (random.OnceIn(400)) {
-    text = ToUtf16(text, random);
+    text = random.OnceIn(8) ? std::string(EBCDIC) : ToUtf16(text, random);
   }
   if (random.OnceIn(3)) {
     const std::string other = random.OnceIn(4) ? Generator(random).Generate() : TokenSoup(random);

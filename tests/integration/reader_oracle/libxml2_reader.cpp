@@ -41,7 +41,7 @@ Session &Self(void *self) {
 }
 
 void OnDocumentType(void *self, const xmlChar *, const xmlChar *, const xmlChar *) {
-  Self(self).reading.hasDocumentType = true;
+  Self(self).reading.hasDocumentType = !Self(self).isRefused;
   xmlStopParser(Self(self).parser);
 }
 

@@ -20,12 +20,13 @@ using Tarvel::Xml::AttributeEvent;
 
 class Recorder final : public Tarvel::Xml::XMLHandler {
 public:
-  explicit Recorder(Reading &reading) : m_reading(reading) {}
+  Recorder(std::string_view document, Reading &reading) : m_document(document), m_reading(reading) {}
 
   void StartDocument(std::string_view, const Ref<Object> &) override {}
 
-  void StartElement(std::string_view name, const AttributeEvent *attributes, std::size_t count, std::uint32_t,
-                    std::uint32_t) override {
+  void StartElement(std::string_view name, const AttributeEvent *attributes, std::size_t count, std::uint32_t line,
+                    std::uint32_t column) override {
+    m_reading.offsets.push_back(OffsetOf(m_document, line, column));
     m_reading.events.StartElement(name);
     m_reading.declarationsFirst.StartElement(name);
     for (std::size_t i = 0; i < count; ++i) {
@@ -67,6 +68,7 @@ public:
   }
 
 private:
+  const std::string_view m_document;
   Reading &m_reading;
 };
 
@@ -83,7 +85,7 @@ Reading ReadWithPlatform(std::string_view document) {
   Reading reading;
   try {
     const auto source = Tarvel::CreateStringReader(std::string(document));
-    Tarvel::Xml::CreateXMLParser(Tarvel::MakeRef<Recorder>(reading))->Parse(*source);
+    Tarvel::Xml::CreateXMLParser(Tarvel::MakeRef<Recorder>(document, reading))->Parse(*source);
   } catch (const Tarvel::Xml::XMLParseException &exception) {
     TakeRefusal(exception, reading);
   }
@@ -92,7 +94,7 @@ Reading ReadWithPlatform(std::string_view document) {
 
 Reading ReadInPlace(std::string_view document) {
   Reading reading;
-  const Ref<Recorder> recorder = Tarvel::MakeRef<Recorder>(reading);
+  const Ref<Recorder> recorder = Tarvel::MakeRef<Recorder>(document, reading);
   try {
     Tarvel::Xml::ReadDocument(document, *recorder);
     reading.isAccepted = true;

@@ -55,7 +55,7 @@ TEST(PrefixesOfDocuments, AreReadByAllReadersAlike) {
       }
       const Testing::Comparison comparison = Testing::Compare(std::string_view(document).substr(0, length));
       ASSERT_EQ(comparison.unexplained, "") << "the first " << length << " octets";
-      accepted += comparison.isAccepted ? 1u : 0u;
+      accepted += comparison.ours.isAccepted ? 1u : 0u;
     }
     former = document;
   }

@@ -29,9 +29,9 @@ TEST(GeneratedDocuments, AreReadByAllReadersAlikeButForNamedDifferences) {
   for (std::uint64_t seed = 0; seed < DOCUMENTS; ++seed) {
     const std::string document = Testing::GenerateXml(seed);
     const Comparison comparison = Compare(document);
-    accepted += comparison.isAccepted ? 1u : 0u;
-    for (const std::size_t rule : comparison.rules) {
-      ++counts[rule];
+    accepted += comparison.ours.isAccepted ? 1u : 0u;
+    for (const Testing::AppliedRule &applied : comparison.rules) {
+      ++counts[applied.rule];
     }
     if (!comparison.unexplained.empty()) {
       ADD_FAILURE() << "document " << seed << ":\n" << comparison.unexplained;

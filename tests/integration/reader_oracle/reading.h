@@ -8,6 +8,7 @@
 #include <cstdint>
 #include <string>
 #include <string_view>
+#include <vector>
 
 namespace Testing {
 
@@ -36,12 +37,13 @@ struct Reading {
   bool hasDocumentType = false;  ///< peers only: they stop there, and what is after it is not judged
   bool hasUnboundPrefix = false; ///< peers only
   EventText events; ///< attributes and declarations in the order of the document; not from peers that part them
-  EventText declarationsFirst;    ///< the declarations of an element before its attributes; without that of "xml"
-  int code = 0;                   ///< peers only: the number of the first error
-  std::string message;            ///< of the refusal; ours without the position
-  std::size_t offset = NO_OFFSET; ///< where expat refuses
-  std::uint32_t line = 0;         ///< of the refusal
-  std::uint32_t column = 0;       ///< ours only
+  EventText declarationsFirst;      ///< the declarations of an element before its attributes; without that of "xml"
+  std::vector<std::size_t> offsets; ///< where the elements begin; ours and expat's without namespaces
+  int code = 0;                     ///< peers only: the number of the first error
+  std::string message;              ///< of the refusal; ours without the position
+  std::size_t offset = NO_OFFSET;   ///< where expat refuses
+  std::uint32_t line = 0;           ///< of the refusal
+  std::uint32_t column = 0;         ///< ours only
 
   static constexpr std::size_t NO_OFFSET = static_cast<std::size_t>(-1);
 };

@@ -12,6 +12,10 @@ namespace {
 
 constexpr std::string_view OCTETS = "<>&;'\"=/!?-[]:# \n\rax1\x7F\x80\xC3\xEF\xFF";
 
+char AnyOctet(RandomSource &random) {
+  return random.OnceIn(3) ? static_cast<char>(random.Below(256)) : OCTETS[random.Below(OCTETS.size())];
+}
+
 struct Part {
   std::size_t begin;
   std::size_t length;
@@ -57,10 +61,10 @@ void Mutate(std::string &text, std::string_view other, RandomSource &random) {
     text[part.begin] = static_cast<char>(static_cast<unsigned char>(text[part.begin]) ^ (1u << random.Below(8)));
     return;
   case 1:
-    text[part.begin] = OCTETS[random.Below(OCTETS.size())];
+    text[part.begin] = AnyOctet(random);
     return;
   case 2:
-    text.insert(part.begin, 1, OCTETS[random.Below(OCTETS.size())]);
+    text.insert(part.begin, 1, AnyOctet(random));
     return;
   case 3:
     text.erase(part.begin, part.length);

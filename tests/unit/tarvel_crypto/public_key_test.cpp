@@ -257,6 +257,27 @@ TEST(GetKeyKind, TellsEveryKind) {
   }
 }
 
+class ForeignCertificate final : public Certificate {
+public:
+  const std::vector<std::uint8_t> &GetDer() const noexcept override { return m_der; }
+  std::string GetSubject() const override { return {}; }
+  std::string GetIssuer() const override { return {}; }
+  std::string GetSha256Thumbprint() const override { return {}; }
+  System::DateTime GetNotBefore() const override { return {}; }
+  System::DateTime GetNotAfter() const override { return {}; }
+  std::string ToPem() const override { return {}; }
+
+private:
+  const std::vector<std::uint8_t> m_der;
+};
+
+TEST(GetKeyKind, RefusesACertificateOfAnotherClass) {
+  unsigned bits = 0;
+  EXPECT_THROWS_MESSAGE(GetKeyKind(*MakeRef<ForeignCertificate>(), bits), TypeMismatchException,
+                        "Type mismatch : expected Tarvel::Crypto::CertificateImpl, but the object is "
+                        "Tarvel::Crypto::(anonymous namespace)::ForeignCertificate");
+}
+
 } // namespace
 
 } // namespace Tarvel::Crypto

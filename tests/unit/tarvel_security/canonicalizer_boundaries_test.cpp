@@ -173,6 +173,11 @@ TEST(CanonicalizeBoundaries, FindsAPrefixAnewWhereItsMeaningChanges) {
   EXPECT_EQ(document, CanonicalDocument(document, Uri::INCLUSIVE));
 }
 
+TEST(CanonicalizeBoundaries, ForgetsADeclarationThatNobodyUsedWhereItsElementEnds) {
+  EXPECT_EQ("<r><e></e><a:f xmlns:a=\"urn:1\"></a:f></r>",
+            CanonicalDocument("<r xmlns:a=\"urn:1\"><e xmlns:a=\"urn:2\"/><a:f/></r>", Uri::EXCLUSIVE));
+}
+
 TEST(CanonicalizeBoundaries, KeepsDataOfOneCharacterInAProcessingInstruction) {
   EXPECT_EQ("<?a b?>\n<r><?c d?><?e f g?><?h?></r>\n<?i j?>",
             CanonicalDocument("<?a b?><r><?c   d?><?e f g?><?h ?></r><?i\nj?>", Uri::INCLUSIVE));

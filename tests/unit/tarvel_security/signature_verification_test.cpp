@@ -446,6 +446,24 @@ TEST(Verify, RaisesAFailureOfCryptographyAsItsOwnClass) {
   EXPECT_TRUE(uris.empty());
 }
 
+/// A resolver of the host's own, which answers what it was given.
+class PlainResolver final : public Tarvel::Xml::Security::KeyInfoResolver {
+public:
+  explicit PlainResolver(CertificateList candidates) : m_candidates(std::move(candidates)) {}
+  CertificateList Resolve(const Tarvel::Xml::ElementNode *) const override { return m_candidates; }
+
+private:
+  const CertificateList m_candidates;
+};
+
+TEST(Verify, PassesOverCandidatesThatAreNull) {
+  Tarvel::Crypto::CertificateList candidates = Trusted({"sts-rsa"});
+  candidates.insert(candidates.begin(), nullptr);
+  candidates.push_back(nullptr);
+  std::set<std::string> uris;
+  EXPECT_TRUE(SignatureOf(*ParseDocument(GoodToken()))->Verify(PlainResolver(candidates), uris));
+}
+
 TEST(Verify, KeepsTheTreeAliveAfterTheDocumentIsGone) {
   Tarvel::Ref<Tarvel::Xml::Security::Signature> signature;
   {

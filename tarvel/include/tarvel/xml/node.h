@@ -224,16 +224,20 @@ public:
 private:
   explicit ElementNode(NodeArena *arena) noexcept : Node(NodeKind::ELEMENT, arena) {}
 
+  /// Where the next attribute, and the next one that is a declaration, are linked.
+  struct AttributeEnd {
+    Attribute **next;
+    Attribute **nextDeclaration;
+  };
+
   // Both take views that live as long as the arena.
   void SetName(std::string_view name) noexcept;
-  void AppendAttribute(std::string_view name, std::size_t prefixLength, std::string_view value);
+  void AppendAttribute(AttributeEnd &end, std::string_view name, std::size_t prefixLength, std::string_view value);
 
+  std::uint32_t m_prefixLength = 0;
   std::string_view m_name;
   Attribute *m_firstAttribute = nullptr;
-  Attribute *m_lastAttribute = nullptr;
   Attribute *m_firstDeclaration = nullptr;
-  Attribute *m_lastDeclaration = nullptr;
-  std::uint32_t m_prefixLength = 0;
   std::uint32_t m_line = 0;
   std::uint32_t m_column = 0;
   friend class NodeArena;

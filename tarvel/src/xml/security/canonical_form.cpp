@@ -10,7 +10,10 @@
 #include <tarvel/xml/security/canonicalizer.h>
 #include <tarvel/xml/security/exceptions.h>
 
+#include <boost/container/small_vector.hpp>
+
 #include <algorithm>
+#include <compare>
 #include <functional>
 #include <tuple>
 #include <utility>
@@ -21,9 +24,6 @@ namespace {
 
 // Attributes are sorted by namespace name, so a long one would be compared again and again.
 constexpr std::size_t MAX_NAMESPACE_NAME_BYTES = 4096;
-
-constexpr std::size_t EXPECTED_DEPTH = 16;
-constexpr std::size_t EXPECTED_ATTRIBUTES = 8; // of one element
 
 constexpr std::string_view XML_NAMESPACE = "http://www.w3.org/XML/1998/namespace";
 constexpr std::string_view INCLUSIVE_WITH_LONE_NUMBER_SIGN = "http://www.w3.org/TR/2001/REC-xml-c14n-20010315#";
@@ -81,8 +81,8 @@ struct CanonicalAttribute {
   std::size_t height; // 0 for the element's own, else how far above it the attribute stands
 
   bool operator<(const CanonicalAttribute &other) const {
-    return std::tie(namespaceUri, localName, height) <=> std::tie(other.namespaceUri, other.localName, other.height) <
-           0;
+    return std::is_lt(std::tie(namespaceUri, localName, height) <=>
+                      std::tie(other.namespaceUri, other.localName, other.height));
   }
   bool HasNameOf(const CanonicalAttribute &other) const {
     return localName == other.localName && namespaceUri == other.namespaceUri;
@@ -93,11 +93,7 @@ struct CanonicalAttribute {
 class CanonicalWalk {
 public:
   CanonicalWalk(const Node &apex, const CanonicalMethod &method, const Node *omitted, Writer &writer)
-      : m_apex(apex), m_method(method), m_omitted(omitted), m_output(writer) {
-    m_openElements.reserve(EXPECTED_DEPTH);
-    m_declarations.reserve(EXPECTED_ATTRIBUTES);
-    m_attributes.reserve(EXPECTED_ATTRIBUTES);
-  }
+      : m_apex(apex), m_method(method), m_omitted(omitted), m_output(writer) {}
 
   void Write();
 
@@ -136,9 +132,10 @@ private:
   const Node *const m_omitted;
   CanonicalOutput m_output;
   NamespaceBindings m_bindings;
-  std::vector<NamespaceBindings::Mark> m_openElements;
-  std::vector<std::size_t> m_declarations;      // of the element at hand, to be written
-  std::vector<CanonicalAttribute> m_attributes; // likewise
+  // With room for what a token needs, which then costs no allocation.
+  boost::container::small_vector<NamespaceBindings::Mark, 16> m_openElements;
+  boost::container::small_vector<std::size_t, 8> m_declarations;       // of the element at hand, to be written
+  boost::container::small_vector<CanonicalAttribute, 16> m_attributes; // likewise
   bool m_documentElementWritten = false;
 };
 

@@ -7,14 +7,11 @@ namespace Tarvel::Xml::Security {
 namespace {
 
 constexpr std::string_view XML_NAMESPACE = "http://www.w3.org/XML/1998/namespace";
-constexpr std::size_t EXPECTED_BINDINGS = 16;
 
 } // namespace
 
 NamespaceBindings::NamespaceBindings() {
   m_buckets.fill(END_OF_BUCKET);
-  m_bindings.reserve(EXPECTED_BINDINGS);
-  m_changes.reserve(EXPECTED_BINDINGS);
   // Both count as written, so that neither is ever declared: "xml" never needs it, and an empty default namespace only
   // where the output has declared another one.
   Declare("", "");

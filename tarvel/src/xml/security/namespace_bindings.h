@@ -4,11 +4,12 @@
 
 #pragma once
 
+#include <boost/container/small_vector.hpp>
+
 #include <array>
 #include <cstddef>
 #include <cstdint>
 #include <string_view>
-#include <vector>
 
 namespace Tarvel::Xml::Security {
 
@@ -66,6 +67,7 @@ public:
 private:
   static constexpr std::uint32_t END_OF_BUCKET = UINT32_MAX;
   static constexpr std::uint32_t BUCKETS = 128; // a power of two
+  static constexpr std::size_t EXPECTED = 16;   // so many bindings, and changes, cost no allocation
 
   struct Change {
     std::size_t index;
@@ -80,8 +82,8 @@ private:
 
   std::size_t m_recent = NOT_BOUND; // what was found last, as long as it is in force: mostly it is asked for again
   std::array<std::uint32_t, BUCKETS> m_buckets;
-  std::vector<Binding> m_bindings;
-  std::vector<Change> m_changes;
+  boost::container::small_vector<Binding, EXPECTED> m_bindings;
+  boost::container::small_vector<Change, EXPECTED> m_changes;
 };
 
 } // namespace Tarvel::Xml::Security

@@ -13,7 +13,7 @@
 
 #include <openssl/crypto.h>
 
-#include <utility>
+#include <vector>
 
 namespace Tarvel {
 namespace Xml {
@@ -115,17 +115,15 @@ bool ParsedSignature::IsGenuine(const KeyInfoResolver &resolver) const {
 
 Crypto::CertificateList ParsedSignature::UsableKeys(const KeyInfoResolver &resolver,
                                                     Crypto::SignatureScheme scheme) const {
-  Crypto::CertificateList usable;
-  for (Ref<const Crypto::Certificate> &candidate : resolver.Resolve(m_syntax.keyInfo)) {
-    if (candidate && CanVerify(*candidate, scheme)) {
-      usable.push_back(std::move(candidate));
-    }
-  }
-  if (usable.empty()) {
+  Crypto::CertificateList keys = resolver.Resolve(m_syntax.keyInfo);
+  std::erase_if(keys, [scheme](const Ref<const Crypto::Certificate> &candidate) {
+    return !candidate || !CanVerify(*candidate, scheme);
+  });
+  if (keys.empty()) {
     throw XmlSecurityException("No trusted key can be used with the signature algorithm \"" +
                                StringUtil::Shorten(m_syntax.signatureMethod.uri) + "\"");
   }
-  return usable;
+  return keys;
 }
 
 std::vector<const Node *> ParsedSignature::Targets() const {

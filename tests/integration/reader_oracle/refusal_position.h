@@ -1,0 +1,19 @@
+// SPDX-License-Identifier: Apache-2.0
+/// @file
+/// Whether a refusal is reported where it must be.
+
+#pragma once
+
+#include "reading.h"
+
+#include <string>
+#include <string_view>
+
+namespace Testing {
+
+/// What is wrong with the position of our refusal of `document`; empty when nothing is. It is within a line of the document
+/// or at the end of one, and the text before it is one that a well-formed document may begin with: cut off there, the
+/// document is accepted, or refused for its end.
+std::string DescribeWrongPosition(std::string_view document, const Reading &refusal);
+
+} // namespace Testing
