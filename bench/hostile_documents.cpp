@@ -2,6 +2,7 @@
 
 #include "hostile_documents.h"
 
+#include <algorithm>
 #include <cstdint>
 #include <functional>
 #include <stdexcept>
@@ -52,6 +53,15 @@ std::string Repeat(std::size_t count, const Piece &piece) {
     text += piece(index);
   }
   return text;
+}
+
+/// `piece` with blanks for its `~`, so many that a document of 16 MiB has not quite as many nodes and attributes as the limit
+/// lets it have. `nodes` of them are in the piece.
+Piece Thin(std::string piece, std::size_t nodes) {
+  constexpr std::size_t OCTETS_A_NODE = 17;
+  const std::size_t blanks = nodes * OCTETS_A_NODE - std::min(piece.size(), nodes * OCTETS_A_NODE);
+  piece.replace(piece.find('~'), 1, blanks + 1, ' ');
+  return Always(std::move(piece));
 }
 
 /// Prefixes that a hash by FNV-1a of 32 bits, its halves combined, puts into one of 128 buckets.
@@ -302,6 +312,49 @@ void AddSignedContent(ShapeList &shapes) {
                   Always('<' + first + ":AttributeValue>a</" + first + ":AttributeValue>"), "</saml:Attribute>");
 }
 
+/// As many nodes as there may be, which takes most memory.
+void AddMostNodes(ShapeList &shapes) {
+  shapes.AddDocument("most elements", Thin("<a~/>", 1));
+  shapes.AddDocument("most elements with an end tag", Thin("<a~></a>", 1));
+  shapes.AddDocument("most elements with an attribute", Thin("<a b=''~/>", 2));
+  shapes.AddDocument("most elements with a text", Thin("<a~>b</a>", 2));
+  shapes.AddDocument("most comments", Thin("<!--~-->", 1));
+  shapes.AddDocument("most instructions", Thin("<?a~?>", 1));
+  shapes.AddToken("most values", "<saml:AttributeStatement>",
+                  "<saml:AttributeStatement xmlns:s='urn:oasis:names:tc:SAML:2.0:assertion'><saml:Attribute Name='a'>",
+                  Thin("<s:AttributeValue~>a</s:AttributeValue>", 2), "</saml:Attribute>");
+  shapes.AddToken("most groups", "<saml:AttributeStatement>",
+                  "<saml:AttributeStatement xmlns:s='urn:oasis:names:tc:SAML:2.0:assertion'>"
+                  "<saml:Attribute Name='http://www.rsa.com/schemas/attr-names/2009/01/GroupIdentity'>",
+                  Thin("<s:AttributeValue~>a\\b</s:AttributeValue>", 2), "</saml:Attribute>");
+  shapes.AddToken("most attributes", "<saml:Attribute Name=", "", Thin("<saml:Attribute Name='a'~/>", 2),
+                  "<saml:Attribute Name=");
+  shapes.AddToken("most elements where attributes belong", "<saml:Attribute Name=", "", Thin("<a~/>", 1),
+                  "<saml:Attribute Name=");
+  shapes.AddToken("most attributes without a name", "<saml:Attribute Name=", "", Thin("<saml:Attribute a=''~/>", 2),
+                  "<saml:Attribute Name=");
+  shapes.AddToken("most attributes with a value", "<saml:Attribute Name=", "",
+                  Thin("<saml:Attribute Name='a'~><saml:AttributeValue>a</saml:AttributeValue></saml:Attribute>", 4),
+                  "<saml:Attribute Name=");
+  const std::string advice = "<saml:Advice xmlns:r='http://www.rsa.com/names/2009/12/std-ext/SAML2.0'>";
+  shapes.AddToken("most pieces of advice", AFTER_CONDITIONS, advice, Thin("<r:RSAAdvice AdviceSource='a'~/>", 2),
+                  "</saml:Advice>" + Before(AFTER_CONDITIONS));
+  shapes.AddToken("most attributes of advice", AFTER_CONDITIONS, advice + "<r:RSAAdvice AdviceSource='a'>",
+                  Thin("<saml:Attribute Name='a'~/>", 2), "</r:RSAAdvice></saml:Advice>" + Before(AFTER_CONDITIONS));
+  shapes.AddToken("most transforms", "<ds:Transform ", "", Thin("<ds:Transform Algorithm='a'~/>", 2), "<ds:Transform ");
+  shapes.AddToken("most references", "<ds:Reference ", "",
+                  Thin("<ds:Reference URI=''~><ds:DigestMethod Algorithm=''/><ds:DigestValue>AA==</ds:DigestValue>"
+                       "</ds:Reference>",
+                       6),
+                  "<ds:Reference ");
+  shapes.AddToken("most references with transforms", "<ds:Reference ", "",
+                  Thin("<ds:Reference URI=''~><ds:Transforms><ds:Transform Algorithm=''/></ds:Transforms>"
+                       "<ds:DigestMethod Algorithm=''/><ds:DigestValue>AA==</ds:DigestValue></ds:Reference>",
+                       9),
+                  "<ds:Reference ");
+  shapes.AddToken("most elements in a signature", IN_KEY_INFO, "", Thin("<a~/>", 1), Before(IN_KEY_INFO));
+}
+
 /// `ds:KeyInfo` holds what it likes, and no digest covers it.
 void AddSignatureContent(ShapeList &shapes) {
   const std::string after(IN_KEY_INFO);
@@ -377,6 +430,7 @@ std::vector<HostileShape> MakeHostileShapes(const std::string &token) {
   AddUnterminated(shapes);
   AddSignedContent(shapes);
   AddSignatureContent(shapes);
+  AddMostNodes(shapes);
   return shapes.Take();
 }
 

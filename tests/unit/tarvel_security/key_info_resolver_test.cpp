@@ -50,6 +50,17 @@ TEST_F(TrustSetKeyResolver, LooksPastWhiteSpaceInTheCertificate) {
   EXPECT_EQ(CertificateList{m_trusted[1]}, Resolve(m_trusted, X509(" " + text + "\t")));
 }
 
+// Of the longest certificate, whose length bounds how much of a text is looked at.
+TEST_F(TrustSetKeyResolver, LeavesTheWholeSetForATextThatOnlyBeginsWithATrustedCertificate) {
+  std::string longest;
+  for (const char *const name : {"sts-rsa", "sts-rsa-2", "sts-ec256"}) {
+    const std::string text = Base64Of(name);
+    longest = text.size() > longest.size() ? text : longest;
+  }
+  EXPECT_EQ(1u, Resolve(m_trusted, X509(longest + " ")).size());
+  EXPECT_EQ(m_trusted, Resolve(m_trusted, X509(longest + " A")));
+}
+
 TEST_F(TrustSetKeyResolver, SelectsAllTrustedCertificatesThatKeyInfoHolds) {
   EXPECT_EQ((CertificateList{m_trusted[2], m_trusted[0]}),
             Resolve(m_trusted, X509(Base64Of("sts-ec256")) + X509(Base64Of("other")) + X509(Base64Of("sts-rsa")) +

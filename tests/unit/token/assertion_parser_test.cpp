@@ -2,8 +2,11 @@
 #include "token/assertion_parser.h"
 
 #include "support/parsed_document.h"
+#include "support/throws_message.h"
+#include "token/statement_parser.h"
 #include "unit/token/assertion_text.h"
 
+#include <ssoclient/exceptions.h>
 #include <tarvel/crypto/certificate.h>
 
 #include <gtest/gtest.h>
@@ -106,6 +109,29 @@ TEST(ParseSamlAssertionElement, ReadsStatements) {
   EXPECT_EQ("", attributes[1].NameFormat);
   EXPECT_EQ("", attributes[1].FriendlyName);
   EXPECT_TRUE(attributes[1].values.empty());
+}
+
+TEST(ParseSamlAssertionElement, MakesRoomForItsAttributesOnce) {
+  std::string attributes;
+  for (int i = 0; i < 5; ++i) {
+    attributes += "<saml:Attribute Name=\"urn:one\"/> ";
+  }
+  const SamlAssertionType assertion = Parse(ReplaceOnce(BearerAssertion(), Piece::ATTRIBUTES, attributes));
+  EXPECT_EQ(5u, assertion.AttributeStatement->attributes.size());
+  EXPECT_EQ(5u, assertion.AttributeStatement->attributes.capacity());
+}
+
+TEST(ParseAttributeStatementElement, MakesNoRoomForElementsThatCannotBeAttributes) {
+  std::string text = "<saml:AttributeStatement xmlns:saml=\"urn:oasis:names:tc:SAML:2.0:assertion\">";
+  for (int i = 0; i < 100; ++i) {
+    text += "<saml:Attribute/>";
+  }
+  const ParsedDocument document(text + "</saml:AttributeStatement>");
+  NodeFilterIterator iterator = document.Cursor();
+  AttributeStatementType statement;
+  EXPECT_THROWS_MESSAGE(ParseAttributeStatementElement(iterator, statement), ParseException,
+                        "Node 'saml:Attribute is missing required attribute 'Name'");
+  EXPECT_LE(statement.attributes.capacity(), 1u); // for the one that was being read
 }
 
 TEST(ParseSamlAssertionElement, LeavesAdviceAndAttributesEmptyWhenTheyAreAbsent) {

@@ -17,17 +17,19 @@ namespace {
 
 constexpr std::size_t MAX_KEY_INFO_CERTIFICATES = 16; // further ones are not compared
 
-/// Whether `text` is `base64` with white space between its characters.
-bool IsSpacedForm(std::string_view text, std::string_view base64) {
-  std::size_t matched = 0;
+/// `text` without white space; nothing when more than `most` characters are left, so that a long text takes little memory.
+std::string WithoutWhiteSpace(std::string_view text, std::size_t most) {
+  std::string compact;
   for (const char character : text) {
-    if (matched < base64.size() && character == base64[matched]) {
-      ++matched;
-    } else if (character != '\n' && character != '\r' && character != ' ' && character != '\t') {
-      return false;
+    if (character == '\n' || character == '\r' || character == ' ' || character == '\t') {
+      continue;
     }
+    if (compact.size() == most) {
+      return std::string();
+    }
+    compact += character;
   }
-  return matched == base64.size();
+  return compact;
 }
 
 /// The certificate texts of a `ds:KeyInfo`, as far as they are looked at.
@@ -79,6 +81,7 @@ public:
     m_base64.reserve(m_trusted.size());
     for (const Ref<const Crypto::Certificate> &certificate : m_trusted) {
       m_base64.push_back(StringUtil::Base64Encode(certificate->GetDer()));
+      m_longestBase64 = std::max(m_longestBase64, m_base64.back().size());
     }
   }
 
@@ -94,9 +97,9 @@ public:
 
 private:
   void AddMatch(std::string_view text, CertificateList &named) const {
+    const std::string base64 = WithoutWhiteSpace(text, m_longestBase64); // once, however many are trusted
     for (std::size_t index = 0; index < m_base64.size(); ++index) {
-      if (IsSpacedForm(text, m_base64[index]) &&
-          std::find(named.begin(), named.end(), m_trusted[index]) == named.end()) {
+      if (base64 == m_base64[index] && std::find(named.begin(), named.end(), m_trusted[index]) == named.end()) {
         named.push_back(m_trusted[index]);
       }
     }
@@ -106,6 +109,7 @@ private:
   // The Base64 form of each trusted certificate, which is unique, so that comparing texts compares bytes; none when there
   // are fewer than two certificates.
   std::vector<std::string> m_base64;
+  std::size_t m_longestBase64 = 0;
 };
 
 } // namespace
