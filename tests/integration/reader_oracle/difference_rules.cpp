@@ -93,8 +93,18 @@ bool HasTooManyDeclarations(const Difference &difference) {
   return OnlyWeRefuseAs(difference, "more than 256 namespace declarations are in scope");
 }
 
+bool DeclaresAscii(std::string_view document) {
+  constexpr std::string_view ASCII = "us-ascii";
+  const std::string_view declaration = document.substr(0, document.find("?>"));
+  const auto isSame = [](char written, char lower) {
+    return (written >= 'A' && written <= 'Z' ? written | 0x20 : written) == lower;
+  };
+  return std::search(declaration.begin(), declaration.end(), ASCII.begin(), ASCII.end(), isSame) != declaration.end();
+}
+
 bool IsNameOfFifthEdition(const Difference &difference) {
   return OnlyTheyRefuse(difference) && difference.theirs.code == XML_ERROR_INVALID_TOKEN &&
+         !DeclaresAscii(difference.document) &&
          BeginsWithNameCharacter(
              difference.document.substr(std::min(difference.theirs.offset, difference.document.size())));
 }
