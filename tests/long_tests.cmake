@@ -10,8 +10,13 @@ function(ssoclient_mark cost label)
 endfunction()
 
 ssoclient_mark(42 waits AServiceThatStalls.EndsALegAfterFortySecondsAndNoOtherRequestSoSoon)
+ssoclient_mark(30 in_full
+  PrefixesOfDocuments.AreReadByAllReadersAlike
+  GeneratedDocuments.AreReadByAllReadersAlikeButForNamedDifferences)
 ssoclient_mark(20 in_full
-  GeneratedDocuments.AreReadByAllReadersAlikeButForNamedDifferences
+  PositionOfRefusal.IsOnTheLineThatLibxml2ReportsButForNamedDifferences
+  PositionOfRefusal.IsAfterTextThatAWellFormedDocumentMayBeginWith
+  DocumentBetweenGuardPages.IsReadAsElsewhereWhateverItIs
   OneServiceOnSixteenThreadsOverTls.RunsTwentyThousandOperationsWithoutErrorOrGrowth
   OneServiceOnSixteenThreads.ComposesReadsAndVerifiesTwentyThousandTimesWithoutErrorOrGrowth
   Of/Truncation.EveryPrefixIsRefusedByTheParser/bearer_50k)
