@@ -59,51 +59,86 @@ bool IsDocumentType(const Difference &difference) {
          FromOurPosition(difference).starts_with("<!DOCTYPE");
 }
 
+std::string_view BeforeOurPosition(const Difference &difference) {
+  return difference.document.substr(0, difference.document.size() - FromOurPosition(difference).size());
+}
+
+bool ContainsIgnoringCase(std::string_view text, std::string_view lowerCase) {
+  const auto isSame = [](char written, char lower) {
+    return (written >= 'A' && written <= 'Z' ? written | 0x20 : written) == lower;
+  };
+  return std::search(text.begin(), text.end(), lowerCase.begin(), lowerCase.end(), isSame) != text.end();
+}
+
+/// Whether we refuse a quoted value in the XML declaration that is none of these two, in any case of letters.
+bool IsOtherValueInDeclaration(const Difference &difference, std::string_view one, std::string_view other) {
+  const std::string_view before = BeforeOurPosition(difference);
+  const std::string_view rest = FromOurPosition(difference);
+  const std::string_view value = rest.substr(0, rest.find_first_of("'\""));
+  const bool isInDeclaration = before.substr(0, 10).find("<?xml") != NPOS && before.find("?>") == NPOS;
+  const bool isOneOfThem = (value.size() == one.size() && ContainsIgnoringCase(value, one)) ||
+                           (value.size() == other.size() && ContainsIgnoringCase(value, other));
+  return isInDeclaration && !isOneOfThem && (before.ends_with('\'') || before.ends_with('"'));
+}
+
 bool IsOtherVersion(const Difference &difference) {
-  return OnlyWeRefuseAs(difference, "the XML version '", "' is not 1.0");
+  return OnlyWeRefuseAs(difference, "the XML version '", "' is not 1.0") &&
+         IsOtherValueInDeclaration(difference, "1.0", "1.0");
 }
 
 bool IsOtherEncoding(const Difference &difference) {
-  return OnlyWeRefuseAs(difference, "the encoding '", "' is declared, only UTF-8 is accepted");
+  return OnlyWeRefuseAs(difference, "the encoding '", "' is declared, only UTF-8 is accepted") &&
+         IsOtherValueInDeclaration(difference, "utf-8", "us-ascii");
+}
+
+bool DeclaresAscii(std::string_view document) {
+  return ContainsIgnoringCase(document.substr(0, document.find("?>")), "us-ascii");
 }
 
 bool IsBeyondAscii(const Difference &difference) {
   const std::string_view rest = FromOurPosition(difference);
   return OnlyWeRefuseAs(difference, "the document is declared as US-ASCII and is not") && !rest.empty() &&
-         static_cast<unsigned char>(rest[0]) >= 0x80;
+         static_cast<unsigned char>(rest[0]) >= 0x80 && DeclaresAscii(difference.document);
 }
 
 bool IsUtf16(const Difference &difference) {
-  return OnlyWeRefuseAs(difference, "the document is UTF-16 or UTF-32");
+  const std::string_view document = difference.document;
+  return OnlyWeRefuseAs(difference, "the document is UTF-16 or UTF-32") &&
+         (document.starts_with("\xFF\xFE") || document.starts_with("\xFE\xFF") ||
+          document.substr(0, 4).find('\0') != NPOS);
 }
 
 bool IsNameTooLong(const Difference &difference) {
-  return OnlyWeRefuseAs(difference, "a name is longer than 4096 bytes");
+  constexpr std::size_t LONGEST = 4096;
+  const std::string_view rest = FromOurPosition(difference);
+  return OnlyWeRefuseAs(difference, "a name is longer than 4096 bytes") && rest.size() > LONGEST &&
+         rest.substr(0, LONGEST + 1).find_first_of("<>/=?&;\"' \t\r\n") == NPOS;
 }
 
 bool IsTooDeep(const Difference &difference) {
-  return OnlyWeRefuseAs(difference, "elements are nested deeper than 256");
+  const std::string_view before = BeforeOurPosition(difference);
+  return OnlyWeRefuseAs(difference, "elements are nested deeper than 256") &&
+         std::count(before.begin(), before.end(), '<') >= 256 && FromOurPosition(difference).starts_with('<');
 }
 
 bool HasTooManyAttributes(const Difference &difference) {
-  return OnlyWeRefuseAs(difference, "an element has more than 256 attributes");
+  const std::string_view rest = FromOurPosition(difference);
+  const std::string_view tag = rest.substr(0, rest.find('<', 1));
+  return OnlyWeRefuseAs(difference, "an element has more than 256 attributes") &&
+         std::count(tag.begin(), tag.end(), '=') > 256;
 }
 
 bool HasTooManyDeclarations(const Difference &difference) {
-  return OnlyWeRefuseAs(difference, "more than 256 namespace declarations are in scope");
-}
-
-bool DeclaresAscii(std::string_view document) {
-  constexpr std::string_view ASCII = "us-ascii";
-  const std::string_view declaration = document.substr(0, document.find("?>"));
-  const auto isSame = [](char written, char lower) {
-    return (written >= 'A' && written <= 'Z' ? written | 0x20 : written) == lower;
-  };
-  return std::search(declaration.begin(), declaration.end(), ASCII.begin(), ASCII.end(), isSame) != declaration.end();
+  std::size_t declarations = 0;
+  for (std::size_t place = difference.document.find("xmlns"); place != NPOS; ++declarations) {
+    place = difference.document.find("xmlns", place + 1);
+  }
+  return OnlyWeRefuseAs(difference, "more than 256 namespace declarations are in scope") && declarations > 256;
 }
 
 bool IsNameOfFifthEdition(const Difference &difference) {
   return OnlyTheyRefuse(difference) && difference.theirs.code == XML_ERROR_INVALID_TOKEN &&
+         (difference.libxml2.isAccepted || difference.libxml2.code == XML_WAR_NS_URI) &&
          !DeclaresAscii(difference.document) &&
          BeginsWithNameCharacter(
              difference.document.substr(std::min(difference.theirs.offset, difference.document.size())));
@@ -157,7 +192,7 @@ bool IsEbcdic(const Difference &difference) {
 }
 
 bool IsNullByte(const Difference &difference) {
-  return OnlyWeRefuseAs(difference, "the document holds a null byte") && FromOurPosition(difference)[0] == '\0';
+  return OnlyWeRefuseAs(difference, "the document holds a null byte") && FromOurPosition(difference).starts_with('\0');
 }
 
 bool IsPrefixXmlnsOnElement(const Difference &difference) {
@@ -166,8 +201,7 @@ bool IsPrefixXmlnsOnElement(const Difference &difference) {
 }
 
 bool IsSpaceMissingAfterEncoding(const Difference &difference) {
-  const std::string_view before =
-      difference.document.substr(0, difference.document.size() - FromOurPosition(difference).size());
+  const std::string_view before = BeforeOurPosition(difference);
   return OnlyWeRefuse(difference) && difference.expat.code == XML_ERROR_XML_DECL && before.find("encoding") != NPOS &&
          before.find("?>") == NPOS && (before.ends_with('"') || before.ends_with('\''));
 }

@@ -19,7 +19,8 @@ using Testing::Compare;
 using Testing::Comparison;
 using Testing::DifferenceRules;
 
-const std::size_t DOCUMENTS = Testing::Repetitions<std::size_t>(2'000'000, 20'000);
+constexpr std::size_t ALL_DOCUMENTS = 2'000'000;
+const std::size_t DOCUMENTS = Testing::Repetitions<std::size_t>(ALL_DOCUMENTS, 20'000);
 constexpr std::size_t MOST_FINDINGS = 20;
 
 TEST(GeneratedDocuments, AreReadByAllReadersAlikeButForNamedDifferences) {
@@ -41,7 +42,7 @@ TEST(GeneratedDocuments, AreReadByAllReadersAlikeButForNamedDifferences) {
   std::cout << accepted << " of " << DOCUMENTS << " documents are accepted\n";
   for (std::size_t i = 0; i < counts.size(); ++i) {
     std::cout << counts[i] << " times " << DifferenceRules()[i].name << "\n";
-    if (DOCUMENTS >= 2'000'000) {
+    if (DOCUMENTS == ALL_DOCUMENTS) {
       EXPECT_NE(counts[i], 0u) << "the rule never applies: " << DifferenceRules()[i].name;
     }
   }
