@@ -92,7 +92,10 @@ bool IsOtherEncoding(const Difference &difference) {
 }
 
 bool DeclaresAscii(std::string_view document) {
-  return ContainsIgnoringCase(document.substr(0, document.find("?>")), "us-ascii");
+  const std::string_view declaration = document.substr(0, document.find("?>"));
+  const std::string_view begin = declaration.substr(declaration.starts_with("\xEF\xBB\xBF") ? 3 : 0).substr(0, 6);
+  return begin.starts_with("<?xml") && begin.find_first_of(" \t\r\n") == 5 &&
+         ContainsIgnoringCase(declaration, "us-ascii");
 }
 
 bool IsBeyondAscii(const Difference &difference) {
