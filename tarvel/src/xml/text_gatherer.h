@@ -38,7 +38,7 @@ public:
     if (m_free == m_text) {
       return std::string_view(m_pieceBegin, static_cast<std::size_t>(place - m_pieceBegin));
     }
-    Gather(place, std::string_view());
+    Gather(place, "");
     return std::string_view(m_text, static_cast<std::size_t>(m_free - m_text));
   }
 
