@@ -81,7 +81,8 @@ bool StartsWith(std::string_view text, std::string_view beginning) noexcept {
 
 /// Removes from `text` what is before the first of `stops`, or all of it. @return what was removed.
 std::string_view Take(std::string_view &text, std::string_view stops) noexcept {
-  const std::string_view taken = text.substr(0, text.find_first_of(stops));
+  const auto end = std::find_first_of(text.begin(), text.end(), stops.begin(), stops.end());
+  const std::string_view taken = text.substr(0, static_cast<std::size_t>(end - text.begin()));
   text.remove_prefix(taken.size());
   return taken;
 }

@@ -20,7 +20,7 @@ namespace Xml {
 /// The declarations in force, and the rules that need them. An unbound prefix is none of its business.
 class NamespaceScope {
 public:
-  explicit NamespaceScope(const SourceCursor &cursor) noexcept : m_cursor(cursor) {}
+  explicit NamespaceScope(const SourceCursor &cursor) : m_cursor(cursor) { m_declarations.reserve(8); }
 
   /// Enters an element.
   /// @param tag where its start tag begins.

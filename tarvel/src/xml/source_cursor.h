@@ -51,26 +51,22 @@ constexpr bool IsOfClass(char character, CharacterClass characterClass) noexcept
   return (CHARACTER_CLASSES[static_cast<unsigned char>(character)] & characterClass) != 0;
 }
 
-/// The high bits of those bytes of `word` that may not be plain: control characters, what is not ASCII, and what the class
-/// leaves out. A bit is right at least up to the first byte in memory that is set where the lowest byte comes first.
+// Most of a text is plain, so that is found out for many bytes at once.
+using Block = signed char __attribute__((vector_size(16)));
+
+/// Whether each byte of `block` may not be plain, which control characters and what is not ASCII never are.
 template <CharacterClass PLAIN>
-constexpr std::uint64_t MarkDoubtfulBytes(std::uint64_t word) noexcept {
-  constexpr std::uint64_t EACH = 0x0101010101010101;
-  constexpr std::uint64_t HIGH_BITS = 0x80 * EACH;
-  const auto marksOf = [word](char c) {
-    const std::uint64_t zeroWhereEqual = word ^ EACH * static_cast<unsigned char>(c);
-    return (zeroWhereEqual - EACH) & ~zeroWhereEqual;
-  };
-  std::uint64_t marks = word | ((word - 0x20 * EACH) & ~word);
+inline Block FindDoubtfulBytes(Block block) noexcept {
+  auto found = block < ' '; // bytes are signed here
   if constexpr (PLAIN == PLAIN_IN_TEXT) {
-    marks |= marksOf('<') | marksOf('&') | marksOf(']');
+    found |= (block == '<') | (block == '&') | (block == ']');
   } else if constexpr (PLAIN == PLAIN_IN_VALUE) {
-    marks |= marksOf('<') | marksOf('&') | marksOf('"') | marksOf('\'');
+    found |= (block == '<') | (block == '&') | (block == '"') | (block == '\'');
   } else {
     static_assert(PLAIN == PLAIN_IN_MARKUP);
-    marks |= marksOf('-') | marksOf(']') | marksOf('?');
+    found |= (block == '-') | (block == ']') | (block == '?');
   }
-  return marks & HIGH_BITS;
+  return found;
 }
 
 /// A name as written, and where its prefix ends.
@@ -145,13 +141,13 @@ public:
     return isHere;
   }
 
-  /// Passes over the plain characters of a class that come next, eight at a time, and over line feeds where they mean no more
+  /// Passes over the plain characters of a class that come next, many at a time, and over line feeds where they mean no more
   /// than these.
   template <CharacterClass PLAIN>
   void SkipPlain() noexcept {
     const char *next = m_next;
     for (;;) {
-      next = SkipPlainWords<PLAIN>(next);
+      next = SkipPlainBlocks<PLAIN>(next);
       if (next == m_end) {
         break;
       }
@@ -211,14 +207,21 @@ public:
                            std::string_view alsoFound = {}) const;
 
 private:
-  /// The first byte at `next` or behind it that is not plain for sure, or one of the last bytes of the text.
+  /// The first byte at `next` or behind it that may not be plain, one of the eight before it, or one of the last of the text.
   template <CharacterClass PLAIN>
-  const char *SkipPlainWords(const char *next) const noexcept {
-    for (std::uint64_t word = 0; m_end - next >= static_cast<std::ptrdiff_t>(sizeof word); next += sizeof word) {
-      std::memcpy(&word, next, sizeof word);
-      const std::uint64_t marks = MarkDoubtfulBytes<PLAIN>(word);
-      if (marks) {
-        return std::endian::native == std::endian::little ? next + std::countr_zero(marks) / 8 : next;
+  const char *SkipPlainBlocks(const char *next) const noexcept {
+    constexpr bool IS_FIRST_BYTE_LOWEST = std::endian::native == std::endian::little;
+    for (; m_end - next >= static_cast<std::ptrdiff_t>(sizeof(Block)); next += sizeof(Block)) {
+      Block block;
+      std::memcpy(&block, next, sizeof block);
+      const Block found = FindDoubtfulBytes<PLAIN>(block);
+      std::uint64_t halves[2];
+      std::memcpy(halves, &found, sizeof halves);
+      if (halves[0]) {
+        return next + (IS_FIRST_BYTE_LOWEST ? std::countr_zero(halves[0]) / 8 : 0);
+      }
+      if (halves[1]) {
+        return next + 8 + (IS_FIRST_BYTE_LOWEST ? std::countr_zero(halves[1]) / 8 : 0);
       }
     }
     return next;
@@ -232,6 +235,10 @@ private:
   /// Passes over those that are ASCII.
   void SkipNameCharacters() noexcept {
     const char *next = m_next;
+    while (m_end - next >= 4 && IsOfClass(next[0], NAME) && IsOfClass(next[1], NAME) && IsOfClass(next[2], NAME) &&
+           IsOfClass(next[3], NAME)) {
+      next += 4;
+    }
     while (next != m_end && IsOfClass(*next, NAME)) {
       ++next;
     }

@@ -4,8 +4,8 @@
 
 #pragma once
 
+#include <algorithm>
 #include <cstddef>
-#include <cstring>
 #include <memory>
 #include <string_view>
 
@@ -55,10 +55,7 @@ private:
     Append(more);
   }
 
-  void Append(std::string_view text) noexcept {
-    std::memcpy(m_free, text.data(), text.size());
-    m_free += text.size();
-  }
+  void Append(std::string_view text) noexcept { m_free = std::copy(text.begin(), text.end(), m_free); }
 
   const char *m_sourceEnd;
   const char *m_pieceBegin = nullptr; // of what is not gathered yet
