@@ -55,8 +55,11 @@ class UsedUpDescriptors {
 public:
   explicit UsedUpDescriptors(int spare) {
     ::getrlimit(RLIMIT_NOFILE, &m_earlier);
-    const rlimit limit{256, m_earlier.rlim_max};
-    ::setrlimit(RLIMIT_NOFILE, &limit);
+    if (spare == 0) { // with the limit at the standard streams, what another thread closes meanwhile is no use either
+      SetLimit(STDERR_FILENO + 1);
+      return;
+    }
+    SetLimit(256);
     for (int one = ::open("/dev/null", O_RDONLY); one >= 0; one = ::open("/dev/null", O_RDONLY)) {
       m_descriptors.push_back(one);
     }
@@ -75,6 +78,11 @@ public:
   }
 
 private:
+  void SetLimit(rlim_t descriptors) const {
+    const rlimit limit{descriptors, m_earlier.rlim_max};
+    ::setrlimit(RLIMIT_NOFILE, &limit);
+  }
+
   rlimit m_earlier{};
   std::vector<int> m_descriptors;
 };
