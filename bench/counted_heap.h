@@ -8,7 +8,7 @@
 
 namespace Bench {
 
-/// Forgets earlier peaks. @returns the octets that are held now.
+/// Forgets earlier peaks. @return the octets that are held now.
 std::size_t StartCountingHeap();
 
 /// The most octets that were held at once since `StartCountingHeap`.

@@ -355,7 +355,7 @@ void AddMostNodes(ShapeList &shapes) {
   shapes.AddToken("most elements in a signature", IN_KEY_INFO, "", Thin("<a~/>", 1), Before(IN_KEY_INFO));
 }
 
-/// `ds:KeyInfo` holds what it likes, and no digest covers it.
+/// `ds:KeyInfo` may hold anything, and no digest covers it.
 void AddSignatureContent(ShapeList &shapes) {
   const std::string after(IN_KEY_INFO);
   shapes.AddToken(

@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// Documents that are made to cost whoever reads them more than their size.
+/// Documents that are made to cost their reader more than their size would.
 
 #pragma once
 

@@ -1,7 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// What hostile documents cost until `CreateSamlToken` refuses or accepts them, for each octet, beside a genuine token of
-/// 5 MB.
+/// What hostile documents cost until `CreateSamlToken` refuses or accepts them, for each octet, compared with a genuine
+/// token of 5 MB.
 
 #include "counted_heap.h"
 #include "hostile_documents.h"
@@ -36,7 +36,7 @@ constexpr std::size_t MIB = 1024 * KIB;
 /// A document that takes longer is read only once, and its shape not tried in the next size: its growth is known by then.
 constexpr double TOO_LONG_SECONDS = 2;
 
-constexpr std::size_t OUTCOME_LENGTH = 90; // of a line's
+constexpr std::size_t OUTCOME_LENGTH = 90; // of what a line shows of a refusal
 
 struct Settings {
   std::array<std::size_t, 3> sizes{1 * MIB, 4 * MIB, 16 * MIB};
@@ -83,7 +83,7 @@ Cost Measure(const std::string &xml, const Tarvel::Crypto::CertificateList &trus
   return best;
 }
 
-/// The worst of something, and whose it is.
+/// The worst value of something, and the shape that has it.
 struct Worst {
   double value = 0;
   std::string shape;

@@ -1,7 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// Reading a text into our tree, beside libxml2's tree, and beside libxml2 and expat where they only call functions that do
-/// nothing.
+/// Reading a text into our tree, compared with libxml2's tree, and with libxml2 and expat where they only call functions
+/// that do nothing.
 
 #include "program.h"
 

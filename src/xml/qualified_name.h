@@ -12,7 +12,7 @@
 
 namespace SsoClient {
 
-/// A qualified name whose texts belong to somebody else, so that names can be compared without being copied.
+/// A qualified name that does not own its texts, so that names can be compared without being copied.
 struct QNameView {
   std::string_view namespaceUri; ///< empty for a name in no namespace
   std::string_view localName;
@@ -22,7 +22,7 @@ struct QNameView {
 
   friend bool operator==(const QNameView &, const QNameView &) = default;
 
-  /// As that of a `QName`.
+  /// The same text as that of a `QName`.
   std::string ToString() const;
 };
 

@@ -4,9 +4,9 @@
 
 #pragma once
 
+#include "crypto/key_contexts.h"
 #include "crypto/openssl_handles.h"
 #include "crypto/public_key.h"
-#include "crypto/key_contexts.h"
 
 #include <tarvel/crypto/certificate.h>
 

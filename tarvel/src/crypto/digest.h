@@ -22,8 +22,8 @@ constexpr std::size_t DigestBytes(DigestAlgorithm algorithm) noexcept {
   return algorithm == DigestAlgorithm::SHA256 ? 32 : algorithm == DigestAlgorithm::SHA384 ? 48 : 64;
 }
 
-/// A digest in the making. For one thread, and a local variable there: what else uses OpenSSL on the thread meanwhile must end
-/// first.
+/// A digest that is being computed. For one thread, and a local variable there: what else uses OpenSSL on the thread
+/// meanwhile must end first.
 class Digest {
 public:
   /// @throws CryptoException when the cryptographic library does not offer the algorithm; InvalidStateException when it has

@@ -13,7 +13,7 @@
 namespace Tarvel::Crypto {
 
 /// To make a context costs allocations, and atomic operations on counters that all threads share. A context is for one
-/// thread at a time: so a thread takes one out, uses it and puts it back, the one of its own lane if it is there.
+/// thread at a time: so a thread takes one, uses it and returns it, the one of its own lane if it is there.
 /// `Handle` is one of the owning handles; there are `KINDS` kinds of contexts, numbered from 0. Lock-free; safe on any
 /// thread. The destructor frees nothing, so that a static object never calls OpenSSL after the end of `main`.
 template <typename Handle, std::size_t KINDS>
@@ -23,7 +23,7 @@ public:
   KeptContexts(const KeptContexts &) = delete;
   KeptContexts &operator=(const KeptContexts &) = delete;
 
-  /// A kept context of that kind; null when there is none at hand.
+  /// A kept context of that kind; null when none is kept.
   Handle Take(std::size_t kind) noexcept {
     for (std::size_t distance = 0; distance < LANES; ++distance) {
       Slot &slot = GetSlot(distance, kind);

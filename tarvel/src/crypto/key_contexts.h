@@ -14,8 +14,8 @@
 namespace Tarvel::Crypto {
 
 /// Contexts of one operation, checking or making signatures, and of one key. To set one up costs a fifth of an RSA check,
-/// and a context is for one thread at a time: so a thread takes one out, uses it and puts it back, the one of its own lane
-/// if it is there. Lock-free; safe on any thread.
+/// and a context is for one thread at a time: so a thread takes one, uses it and returns it, the one of its own lane if it
+/// is there. Lock-free; safe on any thread.
 class KeyContexts {
 public:
   KeyContexts() = default;
@@ -23,7 +23,7 @@ public:
   KeyContexts &operator=(const KeyContexts &) = delete;
   ~KeyContexts() { m_contexts.FreeAll(); }
 
-  /// A context set up for `scheme` and `algorithm`; null when there is none at hand.
+  /// A context set up for `scheme` and `algorithm`; null when none is kept.
   KeyContextHandle Take(SignatureScheme scheme, DigestAlgorithm algorithm) noexcept {
     return m_contexts.Take(KindOf(scheme, algorithm));
   }

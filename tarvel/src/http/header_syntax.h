@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// What may stand in the header of an HTTP message (RFC 9110, section 5).
+/// What may appear in the header of an HTTP message (RFC 9110, section 5).
 
 #pragma once
 

@@ -87,7 +87,7 @@ void CheckCharacters(std::string_view url) {
   }
 }
 
-/// What `digits` say; nothing when there is none or no integer holds it.
+/// The number that `digits` are; nothing when they are empty or the number is larger than an `int`.
 std::optional<int> ReadNumber(std::string_view digits) noexcept {
   int number = 0;
   if (std::from_chars(digits.data(), digits.data() + digits.size(), number).ec != std::errc()) {

@@ -15,7 +15,7 @@ namespace Xml {
 namespace {
 
 constexpr std::string_view DECLARATION_BEGIN = "<?xml";
-constexpr std::size_t FIRST_BYTES = 4; // enough to tell the encodings of Unicode apart (XML 1.0, appendix F)
+constexpr std::size_t FIRST_BYTES = 4; // enough to distinguish the encodings of Unicode (XML 1.0, appendix F)
 
 /// Reads the parts of an XML declaration (XML 1.0, section 2.8), which come in one order.
 class DeclarationReader {

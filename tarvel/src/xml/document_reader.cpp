@@ -97,7 +97,7 @@ void DocumentReader::RefuseEnd() const {
   m_cursor.Refuse(Refusal::ELEMENT_NOT_CLOSED, end, m_open.back().name, std::to_string(m_open.back().line));
 }
 
-/// Reads white space or one piece of markup before or behind the document element.
+/// Reads white space or one piece of markup before or after the document element.
 void DocumentReader::ReadOutside() {
   if (m_cursor.SkipSpace()) {
     return;

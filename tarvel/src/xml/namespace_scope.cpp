@@ -97,7 +97,7 @@ void NamespaceScope::CheckPair(const AttributeEvent &first, const AttributeEvent
   }
 }
 
-// Attributes of one local name are neighbours once they are sorted, and among them those of one namespace after a second
+// Attributes of one local name are adjacent once they are sorted, and among them those of one namespace after a second
 // sorting. Of all pairs that must not be, the one is reported whose second attribute comes first.
 void NamespaceScope::CheckManyNames(const std::vector<AttributeEvent> &attributes) {
   std::pair<std::size_t, std::size_t> firstPair(UNKNOWN, UNKNOWN); // the second attribute, the first
@@ -145,7 +145,7 @@ void NamespaceScope::CheckManyNames(const std::vector<AttributeEvent> &attribute
   }
 }
 
-/// The declaration that stands for the namespace that `prefix` is bound to; `UNKNOWN` when it is empty or not bound.
+/// The declaration that represents the namespace that `prefix` is bound to; `UNKNOWN` when it is empty or not bound.
 std::size_t NamespaceScope::FindNamespace(std::string_view prefix) {
   if (prefix.empty()) {
     return UNKNOWN;

@@ -17,7 +17,7 @@
 namespace Tarvel {
 namespace Xml {
 
-/// The declarations in force, and the rules that need them. An unbound prefix is none of its business.
+/// The declarations in force, and the rules that need them. An unbound prefix is not refused here.
 class NamespaceScope {
 public:
   explicit NamespaceScope(const SourceCursor &cursor) : m_cursor(cursor) { m_declarations.reserve(8); }
@@ -39,7 +39,7 @@ private:
     std::string_view written; // the namespace name as the source has it, if nothing was replaced in it
     std::string replaced;     // the namespace name otherwise
     std::size_t representative =
-        UNKNOWN; // the first declaration in force of an equal namespace name, once it was sought
+        UNKNOWN; // the first declaration in force of an equal namespace name, once it was searched for
 
     std::string_view GetNamespace() const noexcept { return replaced.empty() ? written : replaced; }
   };

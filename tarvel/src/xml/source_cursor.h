@@ -78,7 +78,7 @@ struct WrittenName {
   std::string_view GetLocalName() const noexcept { return prefixLength ? text.substr(prefixLength + 1) : text; }
 };
 
-/// Never looks at or behind the end of the text.
+/// Never looks at the end of the text or beyond it.
 class SourceCursor {
 public:
   /// @param source outlives the cursor.
@@ -88,7 +88,7 @@ public:
 
   bool IsAtEnd() const noexcept { return m_next == m_end; }
 
-  /// The byte to come. Not to be asked at the end.
+  /// The byte to come. Must not be called at the end.
   char Peek() const noexcept { return *m_next; }
   bool IsAt(char byte) const noexcept { return m_next != m_end && *m_next == byte; }
   bool IsAt(std::string_view literal) const noexcept {
@@ -134,7 +134,7 @@ public:
     return isHere;
   }
 
-  /// Passes over `literal` with `last` behind it if both come next. @return whether they do.
+  /// Passes over `literal` with `last` after it if both come next. @return whether they do.
   bool Skip(std::string_view literal, char last) noexcept {
     const bool isHere = GetRemaining() > literal.size() && m_next[literal.size()] == last && IsAt(literal);
     m_next += isHere ? literal.size() + 1 : 0;
@@ -197,7 +197,7 @@ public:
   }
 
   /// Passes over a name with at most one colon, which is between two names. @return an empty name when none comes next.
-  /// @param atEnd the reason when the document ends behind the colon.
+  /// @param atEnd the reason when the document ends after the colon.
   /// @throws XMLParseException when it has other colons or is too long.
   WrittenName ReadName(Refusal atEnd);
 
@@ -207,7 +207,7 @@ public:
                            std::string_view alsoFound = {}) const;
 
 private:
-  /// The first byte at `next` or behind it that may not be plain, one of the eight before it, or one of the last of the text.
+  /// The first byte at `next` or after it that may not be plain, one of the eight before it, or one of the last of the text.
   template <CharacterClass PLAIN>
   const char *SkipPlainBlocks(const char *next) const noexcept {
     constexpr bool IS_FIRST_BYTE_LOWEST = std::endian::native == std::endian::little;

@@ -26,14 +26,14 @@ public:
     m_text = m_free;
   }
 
-  /// In place of the source from `begin` to `end`, which are behind all that was replaced before, the text has `by`, which
-  /// is no longer.
+  /// In place of the source from `begin` to `end`, which are after all that was replaced before, the text has `by`, which is
+  /// at most as long.
   void Replace(const char *begin, const char *end, std::string_view by) {
     Gather(begin, by);
     m_pieceBegin = end;
   }
 
-  /// The text up to `place` of the source; it is good until the next `Clear`.
+  /// The text up to `place` of the source; it is valid until the next `Clear`.
   std::string_view End(const char *place) {
     if (m_free == m_text) {
       return std::string_view(m_pieceBegin, static_cast<std::size_t>(place - m_pieceBegin));
@@ -42,7 +42,7 @@ public:
     return std::string_view(m_text, static_cast<std::size_t>(m_free - m_text));
   }
 
-  /// Gives up all texts.
+  /// Frees the place of all texts.
   void Clear() noexcept { m_free = m_buffer.get(); }
 
 private:
@@ -60,7 +60,7 @@ private:
   const char *m_sourceEnd;
   const char *m_pieceBegin = nullptr; // of what is not gathered yet
   std::unique_ptr<char[]> m_buffer;
-  char *m_free = nullptr; // behind all texts
+  char *m_free = nullptr; // after all texts
   char *m_text = nullptr; // the current text begins there
 };
 

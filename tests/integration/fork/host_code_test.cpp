@@ -92,7 +92,7 @@ TEST(ForkBesideTheHostsCode, DoesNotWaitForTheCompletionOfARequest) {
   EXPECT_EQ(response->GetStatusCode(), 200);
 }
 
-/// A handler that is held in the midst of a parse.
+/// A handler that is held while a document is parsed.
 class HeldHandler final : public Xml::XMLHandler {
 public:
   explicit HeldHandler(Gate &gate) : m_gate(gate) {}

@@ -23,7 +23,6 @@ namespace {
 
 using Tarvel::Exception;
 using Tarvel::Ref;
-using Tarvel::Http::ConnectionSpec;
 using Tarvel::System::ScheduledItem;
 using Tarvel::System::Stream;
 using Testing::FailingHeap;

@@ -48,7 +48,7 @@ struct Comparison {
   std::string unexplained;        ///< a difference for which there is no rule; empty when there is none
 };
 
-/// Reads `document` with everybody.
+/// Reads `document` with all readers.
 Comparison Compare(std::string_view document);
 
 /// `text` with everything but printable ASCII as \xHH.

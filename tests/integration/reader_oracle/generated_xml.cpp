@@ -237,7 +237,7 @@ private:
   std::string AttributeValue() {
     const std::size_t begin = m_text.size();
     PutText();
-    const std::string value = m_text.substr(begin);
+    std::string value = m_text.substr(begin);
     m_text.resize(begin);
     return value;
   }
@@ -296,7 +296,7 @@ private:
   std::string PutStartTag() {
     std::vector<WrittenAttribute> attributes;
     AddDeclarations(attributes);
-    const std::string name = QualifiedName();
+    std::string name = QualifiedName();
     AddAttributes(attributes);
     Put("<" + name);
     for (const WrittenAttribute &attribute : attributes) {

@@ -1,5 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
-// One document for each kind of difference that is meant, and who reads it otherwise than we do.
+// One document for each kind of difference that is meant, and which readers read it otherwise than ours.
 
 #include "comparison.h"
 
@@ -40,7 +40,7 @@ std::string Numbered(std::size_t count, const std::string &before, const std::st
 struct Example {
   std::string document;
   std::string rule;
-  unsigned peers;  // who differ
+  unsigned peers;  // that differ
   bool isAccepted; // by us
 };
 

@@ -18,11 +18,11 @@
 
 namespace {
 
-// In the everyday run, of the documents beyond the one length only prefixes at the other distance.
+// Of documents longer than the first number, the everyday run reads only prefixes whose length the second one divides.
 constexpr std::size_t LARGE = 20'000;
 constexpr std::size_t LARGE_STEP = 211;
 
-/// The texts of all documents among the test data, sorted, so that those with a common beginning are neighbours.
+/// The texts of all documents among the test data, sorted, so that those with a common beginning are adjacent.
 std::vector<std::string> AllDocuments() {
   std::vector<std::string> documents;
   for (const auto &entry : std::filesystem::recursive_directory_iterator(Testing::DataPath(""))) {

@@ -22,7 +22,7 @@ using Tarvel::Xml::MAX_DOCUMENT_BYTES;
 using Tarvel::Xml::MAX_NAME_BYTES;
 using Tarvel::Xml::MAX_NODES;
 
-constexpr std::size_t MAX_HEAP_OCTETS = 160u * 1024 * 1024; // beside the text that the caller has
+constexpr std::size_t MAX_HEAP_OCTETS = 160u * 1024 * 1024; // in addition to the text that the caller has
 
 std::string Repeated(const std::string &piece, std::size_t count) {
   std::string text;
@@ -33,7 +33,7 @@ std::string Repeated(const std::string &piece, std::size_t count) {
   return text;
 }
 
-const std::string REFERENCE = "&#65;"; // where it occurs, a text cannot be used where it is
+const std::string REFERENCE = "&#65;"; // a text that has one must be copied to be decoded
 
 struct LargeDocument {
   const char *name;

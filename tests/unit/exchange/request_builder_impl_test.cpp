@@ -257,8 +257,7 @@ TEST_F(RequestBuilderImplTest, AValidateRequestIsNotSignedEvenWithAnIdentity) {
 TEST_F(RequestBuilderImplTest, AFailureWhileComposingLeavesTheBodyAsItWas) {
   m_request.body = "earlier";
   EXPECT_THROWS_MESSAGE(m_plain.BuildValidateSubjectRequest(UNPARSABLE_BEARER_TOKEN, m_request),
-                        Tarvel::Xml::XMLParseException,
-                        "the document ends in a start tag at line 1, column 9");
+                        Tarvel::Xml::XMLParseException, "the document ends in a start tag at line 1, column 9");
   EXPECT_EQ(m_request.soapAction, Request::VALIDATE);
   EXPECT_EQ(m_request.body, "earlier");
 }

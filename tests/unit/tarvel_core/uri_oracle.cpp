@@ -28,7 +28,7 @@ bool IsUriOfLibxml2(const std::string &text) {
   return UriHandle(xmlParseURI(text.c_str())) != nullptr;
 }
 
-/// `text`, which ours accepts, with a port that libxml2 accepts as well.
+/// `text`, which we accept, with a port that libxml2 accepts as well.
 std::string CorrectPort(std::string text, UriComparison &comparison) {
   const std::optional<std::string_view> port = SplitUriReference(text)->port;
   if (!port) {
@@ -64,7 +64,7 @@ std::string_view ToView(const char *text) {
   return text ? text : "";
 }
 
-/// libxml2 tells an empty part from a missing one in query and fragment only.
+/// libxml2 distinguishes an empty part from a missing one in query and fragment only.
 bool HasEqualParts(const std::string &text) {
   const UriHandle theirs(xmlParseURIRaw(text.c_str(), RAW));
   const std::optional<UriReference> ours = SplitUriReference(text);

@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// Our reading of RFC 3986 beside libxml2's.
+/// Our reading of RFC 3986 compared with libxml2's.
 
 #pragma once
 
@@ -9,7 +9,7 @@
 
 namespace Tarvel {
 
-/// Where the standard and libxml2 2.9.14 differ; ours follows the standard.
+/// Where the standard and libxml2 2.9.14 differ; we follow the standard.
 enum UriDifference {
   EMPTY_PORT,          ///< "port = *DIGIT" may be empty; libxml2 wants one digit at least
   LARGE_PORT,          ///< ... and may have any number of digits; libxml2 wants an int
@@ -19,7 +19,7 @@ enum UriDifference {
 };
 
 struct UriComparison {
-  bool isUriReference = false;                     ///< what ours says
+  bool isUriReference = false;                     ///< what we say
   std::string disagreement;                        ///< empty when both say the same, or differ only in the known ways
   std::array<bool, URI_DIFFERENCES> differences{}; ///< the known ways in which they differ
 };

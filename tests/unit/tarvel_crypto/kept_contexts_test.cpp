@@ -14,7 +14,7 @@ namespace Tarvel::Crypto {
 
 namespace {
 
-/// What stands for a context: it knows whether somebody uses it, and whether it was freed.
+/// In place of a context: it knows whether somebody uses it, and whether it was freed.
 struct Context {
   std::atomic<int> users{0};
   bool freed = false;

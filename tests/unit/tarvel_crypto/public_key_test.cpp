@@ -268,7 +268,7 @@ public:
   std::string ToPem() const override { return {}; }
 
 private:
-  const std::vector<std::uint8_t> m_der;
+  std::vector<std::uint8_t> m_der;
 };
 
 TEST(GetKeyKind, RefusesACertificateOfAnotherClass) {

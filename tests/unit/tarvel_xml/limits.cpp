@@ -168,7 +168,7 @@ std::string DocumentOf(std::size_t nodes) {
 TEST(ParserLimits, AcceptsTheGreatestNumberOfNodesAndNoMore) {
   const std::string most = DocumentOf(MAX_NODES);
   EXPECT_NO_THROW(ParseDocument(most + "</r>"));
-  const auto column = [&most](std::size_t behind) { return std::to_string(most.size() + 1 + behind); };
+  const auto column = [&most](std::size_t further) { return std::to_string(most.size() + 1 + further); };
   const std::string refusal = "the document has more than 1048576 nodes and attributes at line 1, column ";
   for (const std::string more : {"<b/>", "<!--c-->", "<?p?>", "t", "&amp;", "<![CDATA[t]]>"}) {
     EXPECT_THROWS_MESSAGE(ParseDocument(most + more + "</r>"), XMLParseException, refusal + column(0));

@@ -8,8 +8,6 @@
 #include <tarvel/core/exception.h>
 
 #include <gtest/gtest.h>
-#include <libxml/parser.h>
-#include <libxml/xmlerror.h>
 
 #include <algorithm>
 #include <stdexcept>
@@ -221,20 +219,6 @@ TEST(XMLParser, StopsAtAnExceptionOfItsHandlerAndPassesItOn) {
         CreateXMLParser(handler)->Parse(*CreateStringReader("<a>t<![CDATA[u]]><!--c--><?p?><b/><b>t</b></a>")),
         std::out_of_range, event);
   }
-}
-
-TEST(XMLParser, LeavesTheLastErrorOfAHostThatUsesLibxml2Alone) {
-  xmlResetLastError();
-  EXPECT_THROW(ParseDocument("<a><b></a>"), XMLParseException);
-  EXPECT_EQ(xmlGetLastError(), nullptr);
-
-  xmlFreeDoc(xmlReadMemory("<x>", 3, nullptr, nullptr, XML_PARSE_NOERROR));
-  ASSERT_NE(xmlGetLastError(), nullptr);
-  const std::string message = xmlGetLastError()->message;
-  EXPECT_THROW(ParseDocument("<a x='1' x='2'/>"), XMLParseException);
-  ASSERT_NE(xmlGetLastError(), nullptr);
-  EXPECT_EQ(xmlGetLastError()->message, message);
-  xmlResetLastError();
 }
 
 TEST(XMLParser, PrintsNothing) {

@@ -42,10 +42,10 @@ std::string Repeat(const std::string &text, std::size_t count) {
   return repeated;
 }
 
-std::string Numbered(const std::string &before, std::size_t count, const std::string &behind) {
+std::string Numbered(const std::string &before, std::size_t count, const std::string &after) {
   std::string text;
   for (std::size_t i = 0; i < count; ++i) {
-    text.append(before).append(std::to_string(i)).append(behind);
+    text.append(before).append(std::to_string(i)).append(after);
   }
   return text;
 }

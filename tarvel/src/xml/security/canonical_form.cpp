@@ -2,6 +2,7 @@
 
 #include "xml/security/canonical_form.h"
 
+#include "xml/reserved_namespaces.h"
 #include "xml/security/canonical_output.h"
 #include "xml/security/element_place.h"
 #include "xml/security/namespace_bindings.h"
@@ -25,7 +26,6 @@ namespace {
 // Attributes are sorted by namespace name, so a long one would be compared again and again.
 constexpr std::size_t MAX_NAMESPACE_NAME_BYTES = 4096;
 
-constexpr std::string_view XML_NAMESPACE = "http://www.w3.org/XML/1998/namespace";
 constexpr std::string_view INCLUSIVE_WITH_LONE_NUMBER_SIGN = "http://www.w3.org/TR/2001/REC-xml-c14n-20010315#";
 
 /// Whether a URI reference begins with a scheme (RFC 3986, section 3.1), that is, is not relative.

@@ -2,13 +2,9 @@
 
 #include "xml/security/namespace_bindings.h"
 
+#include "xml/reserved_namespaces.h"
+
 namespace Tarvel::Xml::Security {
-
-namespace {
-
-constexpr std::string_view XML_NAMESPACE = "http://www.w3.org/XML/1998/namespace";
-
-} // namespace
 
 NamespaceBindings::NamespaceBindings() {
   m_buckets.fill(END_OF_BUCKET);
