@@ -174,6 +174,10 @@ void AddNamespaces(ShapeList &shapes) {
   const std::string equalLocals = "<a" + Repeat(MANY, [](std::size_t j) { return ' ' + Name(j) + ":a=''"; }) + "/>";
   shapes.AddDocument("attributes of one local name in many namespaces", Always(equalLocals),
                      "<r" + manyDeclarations + '>');
+  // As many attributes as are compared one by one.
+  const std::string fewEqualLocals = "<a" + Repeat(8, [](std::size_t j) { return ' ' + Name(j) + ":a=''"; }) + "/>";
+  shapes.AddDocument("few attributes of one local name below many declarations", Always(fewEqualLocals),
+                     "<r" + manyDeclarations + '>');
   shapes.AddDocument("attributes of one local name in many namespaces of long names", Always(equalLocals),
                      "<r" + Repeat(MANY / 4, Declaring(Name, [&](std::size_t j) { return longUri + Name(j); })) +
                          Repeat(MANY - MANY / 4, [](std::size_t j) { return Declaring(Name, Name)(j + MANY / 4); }) +

@@ -6,6 +6,7 @@
 #include "xml/reserved_namespaces.h"
 
 #include <algorithm>
+#include <array>
 #include <tuple>
 #include <utility>
 
@@ -75,26 +76,41 @@ void NamespaceScope::CheckDeclaration(const AttributeEvent &declaration, std::st
 void NamespaceScope::CheckNames(const std::vector<AttributeEvent> &attributes) {
   if (attributes.size() > FEW_ATTRIBUTES) {
     CheckManyNames(attributes);
-    return;
+  } else if (attributes.size() > 1) {
+    CheckFewNames(attributes);
   }
+}
+
+// Of all pairs that must not be, the one is reported whose second attribute comes first.
+void NamespaceScope::CheckFewNames(const std::vector<AttributeEvent> &attributes) {
+  constexpr std::size_t NOT_SOUGHT = UNKNOWN - 1;
+  std::array<std::size_t, FEW_ATTRIBUTES> namespaces; // each is sought at most once, for the declarations may be many
+  namespaces.fill(NOT_SOUGHT);
+  const auto getNamespace = [&](std::size_t index) {
+    if (namespaces[index] == NOT_SOUGHT) {
+      namespaces[index] = FindNamespace(attributes[index].GetPrefix());
+    }
+    return namespaces[index];
+  };
   for (std::size_t second = 1; second < attributes.size(); ++second) {
     for (std::size_t first = 0; first < second; ++first) {
-      CheckPair(attributes[first], attributes[second]);
+      if (attributes[first].GetLocalName() != attributes[second].GetLocalName()) {
+        continue;
+      }
+      const bool isOneName = attributes[first].name == attributes[second].name;
+      if (isOneName || (getNamespace(first) != UNKNOWN && getNamespace(first) == getNamespace(second))) {
+        RefusePair(attributes[first], attributes[second]);
+      }
     }
   }
 }
 
-void NamespaceScope::CheckPair(const AttributeEvent &first, const AttributeEvent &second) {
+/// Two attributes of one element have one name.
+void NamespaceScope::RefusePair(const AttributeEvent &first, const AttributeEvent &second) const {
   if (first.name == second.name) {
     m_cursor.Refuse(Refusal::ATTRIBUTE_TWICE, second.name.data(), second.name);
   }
-  if (first.prefixLength == 0 || second.prefixLength == 0 || first.GetLocalName() != second.GetLocalName()) {
-    return;
-  }
-  const std::size_t found = FindNamespace(first.GetPrefix());
-  if (found != UNKNOWN && found == FindNamespace(second.GetPrefix())) {
-    m_cursor.Refuse(Refusal::SAME_NAMESPACE_AND_NAME, second.name.data(), first.name, second.name);
-  }
+  m_cursor.Refuse(Refusal::SAME_NAMESPACE_AND_NAME, second.name.data(), first.name, second.name);
 }
 
 // Attributes of one local name are adjacent once they are sorted, and among them those of one namespace after a second
@@ -141,7 +157,7 @@ void NamespaceScope::CheckManyNames(const std::vector<AttributeEvent> &attribute
     begin = end;
   }
   if (firstPair.first != UNKNOWN) {
-    CheckPair(attributes[firstPair.second], attributes[firstPair.first]);
+    RefusePair(attributes[firstPair.second], attributes[firstPair.first]);
   }
 }
 

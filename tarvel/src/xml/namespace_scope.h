@@ -47,8 +47,9 @@ private:
   void Declare(const AttributeEvent &declaration);
   void CheckDeclaration(const AttributeEvent &declaration, std::string_view prefix) const;
   void CheckNames(const std::vector<AttributeEvent> &attributes);
-  void CheckPair(const AttributeEvent &first, const AttributeEvent &second);
+  void CheckFewNames(const std::vector<AttributeEvent> &attributes);
   void CheckManyNames(const std::vector<AttributeEvent> &attributes);
+  [[noreturn]] void RefusePair(const AttributeEvent &first, const AttributeEvent &second) const;
   std::size_t FindNamespace(std::string_view prefix);
   std::size_t FindRepresentative(std::size_t declaration);
 

@@ -75,6 +75,11 @@ std::string WithAttribute() {
   return WithElements("<b c='" + LongestDecoded() + "'/>", 2);
 }
 
+/// The reader keeps a copy of the name as long as the element is open.
+std::string WithDeclaration() {
+  return WithElements("<b xmlns:c='" + LongestDecoded() + "'/>", 2);
+}
+
 std::string WithReferencesInAttribute() {
   return WithElements("<b c='" + DecodedInPieces() + "'/>", 2);
 }
@@ -163,7 +168,7 @@ INSTANTIATE_TEST_SUITE_P(
     testing::Values(LargeDocument{"OneText", WithText}, LargeDocument{"ReferencesInText", WithReferencesInText},
                     LargeDocument{"ReferencesInAttribute", WithReferencesInAttribute},
                     LargeDocument{"TextsBetweenElements", WithTexts}, LargeDocument{"OneAttribute", WithAttribute},
-                    LargeDocument{"Attributes", WithAttributes},
+                    LargeDocument{"OneDeclaration", WithDeclaration}, LargeDocument{"Attributes", WithAttributes},
                     LargeDocument{"ManyAttributesOfAnElement", WithAttributesOfOneElement},
                     LargeDocument{"Declarations", WithDeclarations}, LargeDocument{"LongNames", WithNames},
                     LargeDocument{"Prefixes", WithPrefixes}, LargeDocument{"Comments", WithComments},
