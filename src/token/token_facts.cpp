@@ -46,10 +46,9 @@ void TakeConditions(ConditionsType &conditions, TokenFacts &facts) {
   }
 }
 
-void TakeTokenAttribute(AttributeType &attribute, TokenFacts &facts) {
+void PopulateTokenAttribute(AttributeType &attribute, TokenFacts &facts) {
   if (SamlAttributeIsGroupIdentity(attribute)) {
-    if (facts.groups
-            .empty()) { // else the vector grows by itself: to reserve for each attribute would copy all each time
+    if (facts.groups.empty()) { // with room for each attribute in turn, all groups would be copied each time
       facts.groups.reserve(attribute.values.size());
     }
     for (std::string &value : attribute.values) {
@@ -77,7 +76,7 @@ TokenFacts TakeTokenFacts(SamlAssertionType &&assertion) {
   }
   if (assertion.AttributeStatement) {
     for (AttributeType &attribute : assertion.AttributeStatement->attributes) {
-      TakeTokenAttribute(attribute, facts);
+      PopulateTokenAttribute(attribute, facts);
     }
   }
   TakeConditions(assertion.Conditions, facts);
