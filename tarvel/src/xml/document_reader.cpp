@@ -36,7 +36,6 @@ private:
     std::size_t declarations;
   };
 
-  void ReadContent();
   void ReadOutside();
   void ReadMarkup();
   void ReadStartTag();
@@ -50,6 +49,7 @@ private:
   std::string_view ReadTarget();
   std::string_view ReadValue(std::string_view name);
   void ReadCData();
+  const char *SkipUpTo(std::string_view delimiter, Refusal atEnd);
   void ReplaceReference();
   void ReplaceCarriageReturn(std::string_view by);
   [[noreturn]] void RefuseEnd() const;
@@ -306,15 +306,21 @@ void DocumentReader::ReadCData() {
   const char *const begin = m_cursor.GetPlace();
   m_cursor.Advance(CDATA_BEGIN.size());
   m_gatherer.Replace(begin, m_cursor.GetPlace(), "");
+  const char *const end = SkipUpTo(CDATA_END, Refusal::ENDS_IN_CDATA);
+  m_gatherer.Replace(end, m_cursor.GetPlace(), "");
+}
+
+/// Passes over characters that mean no markup, line ends replaced, and over the `delimiter` that ends them.
+/// @param atEnd the reason when the document ends before. @return where the delimiter begins.
+const char *DocumentReader::SkipUpTo(std::string_view delimiter, Refusal atEnd) {
   for (;;) {
     m_cursor.SkipPlain<PLAIN_IN_MARKUP>();
-    if (m_cursor.IsAtEnd()) {
-      m_cursor.Refuse(Refusal::ENDS_IN_CDATA, m_cursor.GetPlace());
-    }
     const char *const place = m_cursor.GetPlace();
-    if (m_cursor.Skip(CDATA_END)) {
-      m_gatherer.Replace(place, m_cursor.GetPlace(), "");
-      return;
+    if (m_cursor.IsAtEnd()) {
+      m_cursor.Refuse(atEnd, place);
+    }
+    if (m_cursor.Skip(delimiter)) {
+      return place;
     }
     if (*place == '\r') {
       ReplaceCarriageReturn("\n");
@@ -343,28 +349,14 @@ void DocumentReader::ReadComment() {
   Count(m_cursor.GetPlace());
   m_cursor.Advance(COMMENT_BEGIN.size());
   m_gatherer.Begin(m_cursor.GetPlace());
-  for (;;) {
-    m_cursor.SkipPlain<PLAIN_IN_MARKUP>();
-    if (m_cursor.IsAtEnd()) {
-      m_cursor.Refuse(Refusal::ENDS_IN_COMMENT, m_cursor.GetPlace());
-    }
-    const char *const place = m_cursor.GetPlace();
-    if (m_cursor.Skip("--")) {
-      if (m_cursor.IsAtEnd()) {
-        m_cursor.Refuse(Refusal::ENDS_IN_COMMENT, m_cursor.GetPlace());
-      }
-      if (!m_cursor.Skip(">")) {
-        m_cursor.Refuse(Refusal::TWO_HYPHENS_IN_COMMENT, place);
-      }
-      m_handler.Comment(m_gatherer.End(place));
-      return;
-    }
-    if (*place == '\r') {
-      ReplaceCarriageReturn("\n");
-    } else {
-      m_cursor.SkipCharacter();
-    }
+  const char *const end = SkipUpTo("--", Refusal::ENDS_IN_COMMENT);
+  if (m_cursor.IsAtEnd()) {
+    m_cursor.Refuse(Refusal::ENDS_IN_COMMENT, m_cursor.GetPlace());
   }
+  if (!m_cursor.Skip(">")) {
+    m_cursor.Refuse(Refusal::TWO_HYPHENS_IN_COMMENT, end);
+  }
+  m_handler.Comment(m_gatherer.End(end));
 }
 
 void DocumentReader::ReadInstruction() {
@@ -374,22 +366,8 @@ void DocumentReader::ReadInstruction() {
     m_cursor.RefuseNext(Refusal::NO_SPACE_AFTER_TARGET, Refusal::ENDS_IN_INSTRUCTION);
   }
   m_gatherer.Begin(m_cursor.GetPlace());
-  for (;;) {
-    m_cursor.SkipPlain<PLAIN_IN_MARKUP>();
-    if (m_cursor.IsAtEnd()) {
-      m_cursor.Refuse(Refusal::ENDS_IN_INSTRUCTION, m_cursor.GetPlace());
-    }
-    const char *const place = m_cursor.GetPlace();
-    if (m_cursor.Skip(INSTRUCTION_END)) {
-      m_handler.ProcessingInstruction(target, m_gatherer.End(place));
-      return;
-    }
-    if (*place == '\r') {
-      ReplaceCarriageReturn("\n");
-    } else {
-      m_cursor.SkipCharacter();
-    }
-  }
+  const char *const end = SkipUpTo(INSTRUCTION_END, Refusal::ENDS_IN_INSTRUCTION);
+  m_handler.ProcessingInstruction(target, m_gatherer.End(end));
 }
 
 /// Reads the target of a processing instruction. "xml" is reserved in any case of letters; as it is written here it begins
