@@ -15,7 +15,6 @@ using Tarvel::Xml::ElementNode;
 using Tarvel::Xml::QName;
 
 namespace {
-using Tarvel::Xml::QName;
 
 QName ToQName(const QNameView &name) {
   return QName(std::string(name.namespaceUri), std::string(name.localName));

@@ -278,17 +278,16 @@ TEST(Refusals, ReportTheFirstOfManyAttributesThatOccursTwice) {
 }
 
 TEST(Refusals, ReportTheFirstAttributeWhoseNamespaceAndLocalNameAnotherHas) {
-  const std::string declarations = "<a xmlns:p='u' xmlns:q='v' xmlns:r='v' xmlns:s='u'";
   for (const std::string &more : {""s, Numbered(" x", 20, "=''")}) {
-    EXPECT_NO_THROW(ParseDocument(declarations + " o:y='' p:y='' q:y='' y=''" + more + "/>"));
-    EXPECT_THROWS_MESSAGE(ParseDocument(declarations + more + "\no:y='' p:y='' q:y='' s:y=''/>"), XMLParseException,
+    const std::string start = "<a xmlns:p='u' xmlns:q='v' xmlns:r='v' xmlns:s='u'" + more;
+    EXPECT_NO_THROW(ParseDocument(start + " o:y='' p:y='' q:y='' y=''/>"));
+    EXPECT_THROWS_MESSAGE(ParseDocument(start + "\no:y='' p:y='' q:y='' s:y=''/>"), XMLParseException,
                           "the attributes 'p:y' and 's:y' have the same local name in the same namespace at line 2, "
                           "column 22");
-    EXPECT_THROWS_MESSAGE(
-        ParseDocument("<r xmlns:s='u'>" + declarations + more + "\np:y='' q:y='' r:y='' s:y=''/></r>"),
-        XMLParseException,
-        "the attributes 'q:y' and 'r:y' have the same local name in the same namespace at line 2, "
-        "column 15");
+    EXPECT_THROWS_MESSAGE(ParseDocument("<r xmlns:s='u'>" + start + "\np:y='' q:y='' r:y='' s:y=''/></r>"),
+                          XMLParseException,
+                          "the attributes 'q:y' and 'r:y' have the same local name in the same namespace at line 2, "
+                          "column 15");
   }
 }
 
