@@ -118,7 +118,7 @@ std::string WithPrefixes() {
   std::string xml = "<r>";
   for (std::size_t number = 0; xml.size() + 40 < MAX_DOCUMENT_BYTES && number < MAX_NODES / 2 - 1; ++number) {
     const std::string prefix = "p" + std::to_string(number);
-    xml += "<" + prefix + ":a xmlns:" + prefix + "='u'/>";
+    xml.append("<").append(prefix).append(":a xmlns:").append(prefix).append("='u'/>");
   }
   return xml + "</r>";
 }
