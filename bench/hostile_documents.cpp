@@ -333,6 +333,8 @@ void AddMostNodes(ShapeList &shapes) {
                   Thin("<s:AttributeValue~>a\\b</s:AttributeValue>", 2), "</saml:Attribute>");
   shapes.AddToken("most attributes", "<saml:Attribute Name=", "", Thin("<saml:Attribute Name='a'~/>", 2),
                   "<saml:Attribute Name=");
+  shapes.AddToken("most attributes with a reference in the name", "<saml:Attribute Name=", "",
+                  Thin("<saml:Attribute Name='&#65;aaaa'~/>", 2), "<saml:Attribute Name=");
   shapes.AddToken("most elements where attributes belong", "<saml:Attribute Name=", "", Thin("<a~/>", 1),
                   "<saml:Attribute Name=");
   shapes.AddToken("most attributes without a name", "<saml:Attribute Name=", "", Thin("<saml:Attribute a=''~/>", 2),

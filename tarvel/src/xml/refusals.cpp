@@ -16,10 +16,14 @@ namespace {
 constexpr std::size_t NPOS = std::string_view::npos;
 constexpr std::string_view UTF8_MARK = "\xEF\xBB\xBF";
 
-void Replace(std::string &text, std::string_view marker, std::string_view by) {
+/// Puts what was found in the place of `marker`, on one line: a namespace name may have any character by a reference.
+void FillIn(std::string &text, std::string_view marker, std::string_view found) {
   const std::size_t place = text.find(marker);
   if (place != NPOS) {
-    text.replace(place, marker.size(), StringUtil::Shorten(by));
+    std::string shown = StringUtil::Shorten(found);
+    std::replace_if(
+        shown.begin(), shown.end(), [](char c) { return static_cast<unsigned char>(c) < ' ' || c == '\x7F'; }, '?');
+    text.replace(place, marker.size(), shown);
   }
 }
 
@@ -40,8 +44,8 @@ std::size_t GetByteOrderMarkLength(std::string_view source) noexcept {
 void Refuse(Refusal refusal, std::string_view source, std::size_t offset, std::string_view found,
             std::string_view alsoFound) {
   std::string text(REFUSAL_TEXTS[static_cast<std::size_t>(refusal)]);
-  Replace(text, "%2", alsoFound); // first, since what was found may hold "%2"
-  Replace(text, "%1", found);
+  FillIn(text, "%2", alsoFound); // first, since what was found may hold "%2"
+  FillIn(text, "%1", found);
   const SourcePosition position = GetPosition(source, offset);
   throw XMLParseException(text, position.line, position.column);
 }

@@ -4,6 +4,8 @@
 
 #pragma once
 
+#include <tarvel/core/secure_wipe.h>
+
 #include <algorithm>
 #include <cstddef>
 #include <memory>
@@ -19,6 +21,9 @@ class TextGatherer {
 public:
   /// @param sourceEnd the end of the source that all texts are from.
   explicit TextGatherer(const char *sourceEnd) noexcept : m_sourceEnd(sourceEnd) {}
+  TextGatherer(const TextGatherer &) = delete;
+  TextGatherer &operator=(const TextGatherer &) = delete;
+  ~TextGatherer() { Clear(); }
 
   /// Begins a text at `place` of the source.
   void Begin(const char *place) noexcept {
@@ -42,8 +47,13 @@ public:
     return std::string_view(m_text, static_cast<std::size_t>(m_free - m_text));
   }
 
-  /// Frees the place of all texts.
-  void Clear() noexcept { m_free = m_buffer.get(); }
+  /// Overwrites all texts, which may be part of a bearer token, and frees their place.
+  void Clear() noexcept {
+    if (m_free != m_buffer.get()) {
+      SecureWipe(m_buffer.get(), static_cast<std::size_t>(m_free - m_buffer.get()));
+      m_free = m_buffer.get();
+    }
+  }
 
 private:
   void Gather(const char *pieceEnd, std::string_view more) {

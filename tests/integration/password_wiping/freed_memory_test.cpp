@@ -13,6 +13,7 @@
 
 #include <tarvel/core/exception.h>
 #include <tarvel/core/secure_wipe.h>
+#include <tarvel/xml/parser.h>
 
 #include <gtest/gtest.h>
 
@@ -410,6 +411,18 @@ TEST_P(FreedMemory, HoldsNothingOfATextThatCouldNotBeReadToItsEnd) {
     const Watch watch(GetParam());
     EXPECT_THROW(Tarvel::MakeRef<PieceReader>(text, LastRead::THROWS)->ReadToEnd(text.size()), Tarvel::IOException);
     EXPECT_EQ(watch.Found(), 0);
+  }
+}
+
+// The tree of a document that is accepted keeps its texts, and is not overwritten.
+TEST_P(FreedMemory, HoldsNothingOfADocumentThatIsRefusedAfterReferencesWereReplaced) {
+  const std::string secret = GetParam();
+  for (const std::string &text : {"<a x='&amp;" + secret + "' x=''/>", "<a>&amp;" + secret + "&", "<a><!--\r" + secret,
+                                  "<a><?t \r" + secret, "<a x='&lt;' y='&lt;" + secret + "' <"}) {
+    const Watch watch(GetParam());
+    Tarvel::Ref<Tarvel::Xml::Document> document;
+    EXPECT_THROW(ParseXML(text, document), Tarvel::Xml::XMLParseException);
+    EXPECT_EQ(watch.Found(), 0) << text;
   }
 }
 

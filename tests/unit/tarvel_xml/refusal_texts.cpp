@@ -213,6 +213,7 @@ std::vector<Case> GetCases() {
       {R::XMLNS_NAMESPACE_BOUND, "<a xmlns='http://www.w3.org/2000/xmlns/'/>", {}, 1, 4},
       {R::PREFIX_UNDECLARED, "<a xmlns:p='urn:a'><b\nxmlns:p=''/></a>", {"p"}, 2, 1},
       {R::NOT_A_URI_REFERENCE, "<a xmlns='urn:a'\nxmlns:p='urn:a&#32;'/>", {"urn:a "}, 2, 1},
+      {R::NOT_A_URI_REFERENCE, "<a xmlns='&#13;&#10;\xC3\xA4&#127; '/>", {"??\xC3\xA4? "}, 1, 4},
       {R::SAME_NAMESPACE_AND_NAME, "<a xmlns:p='u' xmlns:q='u' p:x=''\nq:x=''/>", {"p:x", "q:x"}, 2, 1},
       {R::SAME_NAMESPACE_AND_NAME, "<r xmlns:p='&#117;'><a xmlns:q='u' p:x='' q:x=''/></r>", {"p:x", "q:x"}, 1, 43},
       {R::SAME_NAMESPACE_AND_NAME,
