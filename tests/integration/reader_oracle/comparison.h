@@ -45,7 +45,7 @@ struct AppliedRule {
 struct Comparison {
   Reading ours;
   std::vector<AppliedRule> rules; ///< those that were needed
-  std::string unexplained;        ///< a difference for which there is no rule; empty when there is none
+  std::string unexplained;        ///< a difference that no rule names, or empty
 };
 
 /// Reads `document` with all readers.
