@@ -1,4 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
+
 #include "client_credential.h"
 
 #include "gss_name.h"

@@ -1,4 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
+
 #include "gss_status.h"
 
 #include "gss_handles.h"

@@ -1,4 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
+
 #include "memory_cache.h"
 
 #include <ssoclient/gssapi/exceptions.h>

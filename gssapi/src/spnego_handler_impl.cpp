@@ -1,4 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
+
 #include "spnego_handler_impl.h"
 
 #include "gss_name.h"

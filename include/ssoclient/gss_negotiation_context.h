@@ -13,8 +13,7 @@
 #include <memory>
 #include <vector>
 
-namespace SsoClient {
-namespace InternalApi {
+namespace SsoClient::InternalApi {
 
 /// The service's answer to one leg.
 struct GssNegotiationResult {
@@ -50,5 +49,4 @@ protected:
 SSOCLIENT_API std::shared_ptr<GssNegotiationContext>
 CreateGssNegotiationContext(const SecurityTokenServiceConfig &config, const TokenSpec &spec);
 
-} // namespace InternalApi
-} // namespace SsoClient
+} // namespace SsoClient::InternalApi

@@ -11,11 +11,9 @@
 
 #include <string>
 
-namespace Tarvel {
-namespace Ssl {
+namespace Tarvel::Ssl {
 class SSLContext;
-} // namespace Ssl
-} // namespace Tarvel
+} // namespace Tarvel::Ssl
 
 namespace SsoClient {
 

@@ -1,4 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
+
 #include "compose/ws_trust.h"
 
 #include "compose/advice_elements.h"

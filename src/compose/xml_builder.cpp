@@ -1,4 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
+
 #include "compose/xml_builder.h"
 
 #include <tarvel/core/secure_wipe.h>

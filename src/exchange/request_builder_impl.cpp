@@ -1,4 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
+
 #include "exchange/request_builder_impl.h"
 
 #include "compose/soap_envelope.h"

@@ -1,4 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
+
 #include "exchange/response_extractors.h"
 
 #include "exchange/soap_response.h"

@@ -1,4 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
+
 #include "exchange/soap_response.h"
 
 #include "model/namespaces.h"

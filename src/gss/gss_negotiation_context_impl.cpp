@@ -1,4 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
+
 #include "gss/gss_negotiation_context_impl.h"
 
 #include <ssoclient/create_saml_token.h>

@@ -1,4 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
+
 #include <ssoclient/descriptions.h>
 
 #include <tarvel/core/message_formatter.h>

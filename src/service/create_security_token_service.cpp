@@ -1,4 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
+
 #include "exchange/request_builder_impl.h"
 #include "exchange/response_handler_impl.h"
 #include "service/security_token_service_impl.h"

@@ -1,4 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
+
 #include "service/operation_frame.h"
 
 #include <ssoclient/logger.h>

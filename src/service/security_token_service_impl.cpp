@@ -1,4 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
+
 #include "service/security_token_service_impl.h"
 
 #include "service/operation_frame.h"

@@ -6,7 +6,7 @@
 
 #include "exchange/request_builder.h"
 #include "exchange/response_handler.h"
-#include "exchange/transport.h"
+#include "transport/transport.h"
 
 #include <ssoclient/security_token_service.h>
 #include <tarvel/core/ref.h>

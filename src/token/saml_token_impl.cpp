@@ -1,4 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
+
 #include "token/saml_token_impl.h"
 
 #include "token/assertion_parser.h"

@@ -1,4 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
+
 #include "token/subject_parser.h"
 
 #include "model/namespaces.h"

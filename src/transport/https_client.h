@@ -4,7 +4,7 @@
 
 #pragma once
 
-#include "exchange/transport.h"
+#include "transport/transport.h"
 
 #include <tarvel/core/ref.h>
 #include <tarvel/http/connection_spec.h>

@@ -1,4 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
+
 #include "xml/node_filter_iterator.h"
 
 #include <string_view>

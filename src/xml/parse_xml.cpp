@@ -1,4 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
+
 #include "xml/parse_xml.h"
 
 #include <tarvel/core/checked_cast.h>

@@ -10,7 +10,7 @@
 
 #include "exchange/request_builder.h"
 #include "exchange/response_handler.h"
-#include "exchange/transport.h"
+#include "transport/transport.h"
 #include "service/security_token_service_impl.h"
 
 #include <tarvel/crypto/certificate.h>

@@ -1,4 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
+
 #include "base64.h"
 
 #include <openssl/evp.h>

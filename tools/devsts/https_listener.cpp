@@ -1,4 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
+
 #include "https_listener.h"
 
 #include "connection.h"

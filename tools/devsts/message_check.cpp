@@ -1,4 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
+
 #include "message_check.h"
 
 #include "token_reader.h"

@@ -1,4 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
+
 #include "state_folder.h"
 
 #include <openssl/bio.h>

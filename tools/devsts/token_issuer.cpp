@@ -1,4 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
+
 #include "token_issuer.h"
 
 #include <openssl/rand.h>

@@ -1,4 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
+
 #include "trust_request.h"
 
 #include "refusal.h"

@@ -1,4 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
+
 #include <tarvel/core/secure_wipe.h>
 
 #include <string.h>

@@ -2,12 +2,10 @@
 
 #include <tarvel/http/connection_spec.h>
 
-namespace Tarvel {
-namespace Http {
+namespace Tarvel::Http {
 
 ConnectionSpec::~ConnectionSpec() = default;
 
 CustomConnectionSpec::~CustomConnectionSpec() = default;
 
-} // namespace Http
-} // namespace Tarvel
+} // namespace Tarvel::Http

@@ -18,8 +18,7 @@
 #include <utility>
 #include <vector>
 
-namespace Tarvel {
-namespace Http {
+namespace Tarvel::Http {
 
 namespace {
 
@@ -167,5 +166,4 @@ void CreateCookieStore(const std::string &name, Ref<CookieStore> &out) {
   out = MakeRef<CookieStoreImpl>();
 }
 
-} // namespace Http
-} // namespace Tarvel
+} // namespace Tarvel::Http

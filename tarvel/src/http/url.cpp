@@ -12,8 +12,7 @@
 #include <charconv>
 #include <optional>
 
-namespace Tarvel {
-namespace Http {
+namespace Tarvel::Http {
 
 TARVEL_DEFINE_EXCEPTION(MalformedURLException)
 
@@ -219,5 +218,4 @@ void ParseHttpURL(std::string_view url, bool &isSecure, std::string &host, int &
   port = foundPort;
 }
 
-} // namespace Http
-} // namespace Tarvel
+} // namespace Tarvel::Http

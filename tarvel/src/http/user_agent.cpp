@@ -8,8 +8,7 @@
 #include <chrono>
 #include <utility>
 
-namespace Tarvel {
-namespace Http {
+namespace Tarvel::Http {
 
 TARVEL_DEFINE_EXCEPTION(HttpException)
 
@@ -79,5 +78,4 @@ void CreateHttpRequest(std::string_view method, std::string_view path, Ref<Clien
   out = MakeRef<ClientRequestImpl>(method, path);
 }
 
-} // namespace Http
-} // namespace Tarvel
+} // namespace Tarvel::Http

@@ -8,8 +8,7 @@
 #include <mutex>
 #include <utility>
 
-namespace Tarvel {
-namespace Service {
+namespace Tarvel::Service {
 
 namespace {
 
@@ -73,5 +72,4 @@ App &GetApp() {
   return *app;
 }
 
-} // namespace Service
-} // namespace Tarvel
+} // namespace Tarvel::Service

@@ -7,8 +7,7 @@
 #include <new>
 #include <utility>
 
-namespace Tarvel {
-namespace Service {
+namespace Tarvel::Service {
 
 namespace {
 
@@ -49,5 +48,4 @@ Ref<Logger> Logger::CreateLogger(const Ref<LogRoot> &root, std::string name, int
   return MakeRef<LoggerImpl>(root, std::move(name), level);
 }
 
-} // namespace Service
-} // namespace Tarvel
+} // namespace Tarvel::Service

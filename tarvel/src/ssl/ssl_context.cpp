@@ -16,8 +16,7 @@
 #include <filesystem>
 #include <system_error>
 
-namespace Tarvel {
-namespace Ssl {
+namespace Tarvel::Ssl {
 
 namespace {
 
@@ -156,5 +155,4 @@ Ref<SSLContext> CreateSSLContext() {
   return MakeRef<SSLContextImpl>();
 }
 
-} // namespace Ssl
-} // namespace Tarvel
+} // namespace Tarvel::Ssl

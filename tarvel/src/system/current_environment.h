@@ -6,11 +6,9 @@
 
 #include <tarvel/system/environment.h>
 
-namespace Tarvel {
-namespace System {
+namespace Tarvel::System {
 
 /// The innermost `ScopedEnvironment`'s, or null when there is none. It lives as long as that scope.
 const Environment *CurrentEnvironment() noexcept;
 
-} // namespace System
-} // namespace Tarvel
+} // namespace Tarvel::System

@@ -8,8 +8,7 @@
 #include <algorithm>
 #include <string>
 
-namespace Tarvel {
-namespace System {
+namespace Tarvel::System {
 
 namespace {
 
@@ -144,5 +143,4 @@ void RefuseDateTimeText(std::string_view text, std::string_view reason) {
   throw DateTimeFormatException("\"" + quoted + "\" is not a date-time: " + std::string(reason));
 }
 
-} // namespace System
-} // namespace Tarvel
+} // namespace Tarvel::System

@@ -7,8 +7,7 @@
 #include <cstdint>
 #include <string_view>
 
-namespace Tarvel {
-namespace System {
+namespace Tarvel::System {
 
 /// The fields as written. Each is in its own range; whether the month has that day is not checked yet.
 struct DateTimeFields {
@@ -29,5 +28,4 @@ DateTimeFields ParseDateTimeText(std::string_view text);
 /// Raises the `DateTimeFormatException` for `text`.
 [[noreturn]] void RefuseDateTimeText(std::string_view text, std::string_view reason);
 
-} // namespace System
-} // namespace Tarvel
+} // namespace Tarvel::System

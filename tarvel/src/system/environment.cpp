@@ -7,8 +7,7 @@
 #include <atomic>
 #include <utility>
 
-namespace Tarvel {
-namespace System {
+namespace Tarvel::System {
 
 namespace {
 
@@ -29,5 +28,4 @@ ScopedEnvironment::~ScopedEnvironment() {
   delete m_environment;
 }
 
-} // namespace System
-} // namespace Tarvel
+} // namespace Tarvel::System

@@ -2,10 +2,8 @@
 
 #include <tarvel/system/scheduled_item.h>
 
-namespace Tarvel {
-namespace System {
+namespace Tarvel::System {
 
 ScheduledItem::~ScheduledItem() = default;
 
-} // namespace System
-} // namespace Tarvel
+} // namespace Tarvel::System

@@ -7,8 +7,7 @@
 
 #include <atomic>
 
-namespace Tarvel {
-namespace System {
+namespace Tarvel::System {
 
 namespace {
 
@@ -48,5 +47,4 @@ Ref<ScheduledItem> CreateStreamCanceller(const Ref<Stream> &stream) {
   return MakeRef<StreamCanceller>(stream);
 }
 
-} // namespace System
-} // namespace Tarvel
+} // namespace Tarvel::System

@@ -19,8 +19,7 @@
 #include <thread>
 #include <utility>
 
-namespace Tarvel {
-namespace System {
+namespace Tarvel::System {
 
 namespace {
 
@@ -301,5 +300,4 @@ Ref<ThreadPool> CreateEndlessThreadPool(std::size_t threadCeiling, std::chrono::
   return MakeRef<ThreadPoolImpl>(threadCeiling, idleTime, true);
 }
 
-} // namespace System
-} // namespace Tarvel
+} // namespace Tarvel::System

@@ -8,8 +8,7 @@
 #include <cstring>
 #include <iterator>
 
-namespace Tarvel {
-namespace Xml {
+namespace Tarvel::Xml {
 
 namespace {
 
@@ -210,5 +209,4 @@ bool IsNcName(std::string_view name) noexcept {
   return !name.empty();
 }
 
-} // namespace Xml
-} // namespace Tarvel
+} // namespace Tarvel::Xml

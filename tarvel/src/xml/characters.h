@@ -9,8 +9,7 @@
 #include <string>
 #include <string_view>
 
-namespace Tarvel {
-namespace Xml {
+namespace Tarvel::Xml {
 
 constexpr std::uint32_t NO_CHARACTER = 0xFFFFFFFF;
 
@@ -42,5 +41,4 @@ char *WriteCharacter(std::uint32_t character, char *target) noexcept;
 /// Whether `name` is an NCName: a name without a colon.
 bool IsNcName(std::string_view name) noexcept;
 
-} // namespace Xml
-} // namespace Tarvel
+} // namespace Tarvel::Xml

@@ -9,8 +9,7 @@
 #include <optional>
 #include <string_view>
 
-namespace Tarvel {
-namespace Xml {
+namespace Tarvel::Xml {
 
 namespace {
 
@@ -126,5 +125,4 @@ void ReadDocumentBeginning(SourceCursor &cursor) {
   }
 }
 
-} // namespace Xml
-} // namespace Tarvel
+} // namespace Tarvel::Xml

@@ -6,13 +6,11 @@
 
 #include "xml/source_cursor.h"
 
-namespace Tarvel {
-namespace Xml {
+namespace Tarvel::Xml {
 
 /// Passes over a byte order mark and an XML declaration, both of which may be missing.
 /// @throws XMLParseException when the document is empty, too long, in another encoding than UTF-8 or another version than
 ///         XML 1.0, or its declaration is malformed.
 void ReadDocumentBeginning(SourceCursor &cursor);
 
-} // namespace Xml
-} // namespace Tarvel
+} // namespace Tarvel::Xml

@@ -12,8 +12,7 @@
 #include <string>
 #include <vector>
 
-namespace Tarvel {
-namespace Xml {
+namespace Tarvel::Xml {
 
 namespace {
 
@@ -410,5 +409,4 @@ void ReadDocument(std::string_view source, XMLHandler &handler) {
   DocumentReader(source, handler).Run();
 }
 
-} // namespace Xml
-} // namespace Tarvel
+} // namespace Tarvel::Xml

@@ -8,8 +8,7 @@
 
 #include <string_view>
 
-namespace Tarvel {
-namespace Xml {
+namespace Tarvel::Xml {
 
 /// Reads a document in one pass from its beginning to its end and hands its events to `handler`, all but `StartDocument`
 /// and `TakeResult`. Never looks beyond the end of `source`. Takes time linear in the length of the document, and memory for
@@ -21,5 +20,4 @@ namespace Xml {
 /// @throws whatever the handler throws.
 void ReadDocument(std::string_view source, XMLHandler &handler);
 
-} // namespace Xml
-} // namespace Tarvel
+} // namespace Tarvel::Xml

@@ -13,8 +13,7 @@
 #include <memory>
 #include <string_view>
 
-namespace Tarvel {
-namespace Xml {
+namespace Tarvel::Xml {
 
 namespace {
 
@@ -238,5 +237,4 @@ void ElementNode::WriteTo(Writer &writer, CharacterForm form) const {
   output.Flush();
 }
 
-} // namespace Xml
-} // namespace Tarvel
+} // namespace Tarvel::Xml

@@ -10,8 +10,7 @@
 #include <tuple>
 #include <utility>
 
-namespace Tarvel {
-namespace Xml {
+namespace Tarvel::Xml {
 
 namespace {
 
@@ -186,5 +185,4 @@ std::size_t NamespaceScope::FindRepresentative(std::size_t declaration) {
   return representative;
 }
 
-} // namespace Xml
-} // namespace Tarvel
+} // namespace Tarvel::Xml

@@ -14,8 +14,7 @@
 #include <string_view>
 #include <vector>
 
-namespace Tarvel {
-namespace Xml {
+namespace Tarvel::Xml {
 
 /// The declarations in force, and the rules that need them. An unbound prefix is not refused here.
 class NamespaceScope {
@@ -58,5 +57,4 @@ private:
   std::vector<std::size_t> m_order; // of the attributes of one element by name, when they are many
 };
 
-} // namespace Xml
-} // namespace Tarvel
+} // namespace Tarvel::Xml

@@ -13,8 +13,7 @@
 #include <string>
 #include <utility>
 
-namespace Tarvel {
-namespace Xml {
+namespace Tarvel::Xml {
 
 namespace {
 
@@ -280,5 +279,4 @@ void CreateTextNode(Ref<TextNode> &out) {
   out = Ref<TextNode>(arena->New<TextNode>(arena));
 }
 
-} // namespace Xml
-} // namespace Tarvel
+} // namespace Tarvel::Xml

@@ -7,8 +7,7 @@
 #include <algorithm>
 #include <cstring>
 
-namespace Tarvel {
-namespace Xml {
+namespace Tarvel::Xml {
 
 namespace {
 
@@ -128,5 +127,4 @@ char *NodeArena::AllocateBlock(std::size_t size) {
   return reinterpret_cast<char *>(block + 1);
 }
 
-} // namespace Xml
-} // namespace Tarvel
+} // namespace Tarvel::Xml

@@ -14,8 +14,7 @@
 #include <type_traits>
 #include <utility>
 
-namespace Tarvel {
-namespace Xml {
+namespace Tarvel::Xml {
 
 /// Memory that grows and is freed at once. Nodes never need destruction, so that dropping a tree costs a few frees,
 /// however large or deep it is.
@@ -113,5 +112,4 @@ private:
   Ref<Object> m_kept;
 };
 
-} // namespace Xml
-} // namespace Tarvel
+} // namespace Tarvel::Xml

@@ -10,8 +10,7 @@
 #include <string>
 #include <utility>
 
-namespace Tarvel {
-namespace Xml {
+namespace Tarvel::Xml {
 
 namespace {
 
@@ -68,5 +67,4 @@ Ref<XMLParser> CreateXMLParser(const Ref<XMLHandler> &handler) {
   return MakeRef<XMLParserImpl>(handler);
 }
 
-} // namespace Xml
-} // namespace Tarvel
+} // namespace Tarvel::Xml

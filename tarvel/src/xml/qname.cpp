@@ -2,8 +2,7 @@
 
 #include <tarvel/xml/qname.h>
 
-namespace Tarvel {
-namespace Xml {
+namespace Tarvel::Xml {
 
 std::string QName::ToString() const {
   return namespaceUri.empty() ? localName : "{" + namespaceUri + "}" + localName;
@@ -13,5 +12,4 @@ std::string FormatMessageArgument(const QName &value) {
   return value.ToString();
 }
 
-} // namespace Xml
-} // namespace Tarvel
+} // namespace Tarvel::Xml

@@ -9,8 +9,7 @@
 #include <iterator>
 #include <string_view>
 
-namespace Tarvel {
-namespace Xml {
+namespace Tarvel::Xml {
 
 namespace {
 
@@ -79,5 +78,4 @@ std::size_t ReadReference(SourceCursor &cursor, char (&replacement)[4]) {
   return 1;
 }
 
-} // namespace Xml
-} // namespace Tarvel
+} // namespace Tarvel::Xml

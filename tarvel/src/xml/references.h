@@ -8,8 +8,7 @@
 
 #include <cstddef>
 
-namespace Tarvel {
-namespace Xml {
+namespace Tarvel::Xml {
 
 /// Reads the reference that the "&" that comes next begins.
 /// @param replacement receives the character as UTF-8, which is never longer than the reference. @return its length.
@@ -17,5 +16,4 @@ namespace Xml {
 ///         a character of XML.
 std::size_t ReadReference(SourceCursor &cursor, char (&replacement)[4]);
 
-} // namespace Xml
-} // namespace Tarvel
+} // namespace Tarvel::Xml

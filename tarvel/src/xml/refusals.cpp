@@ -8,8 +8,7 @@
 #include <algorithm>
 #include <string>
 
-namespace Tarvel {
-namespace Xml {
+namespace Tarvel::Xml {
 
 namespace {
 
@@ -50,5 +49,4 @@ void Refuse(Refusal refusal, std::string_view source, std::size_t offset, std::s
   throw XMLParseException(text, position.line, position.column);
 }
 
-} // namespace Xml
-} // namespace Tarvel
+} // namespace Tarvel::Xml

@@ -8,8 +8,7 @@
 #include <cstdint>
 #include <string_view>
 
-namespace Tarvel {
-namespace Xml {
+namespace Tarvel::Xml {
 
 enum class Refusal : std::uint8_t {
   // Limits
@@ -185,5 +184,4 @@ std::size_t GetByteOrderMarkLength(std::string_view source) noexcept;
 [[noreturn]] void Refuse(Refusal refusal, std::string_view source, std::size_t offset, std::string_view found = {},
                          std::string_view alsoFound = {});
 
-} // namespace Xml
-} // namespace Tarvel
+} // namespace Tarvel::Xml

@@ -6,11 +6,9 @@
 
 #include <string_view>
 
-namespace Tarvel {
-namespace Xml {
+namespace Tarvel::Xml {
 
 constexpr std::string_view XML_NAMESPACE = "http://www.w3.org/XML/1998/namespace"; ///< of the prefix "xml"
 constexpr std::string_view XMLNS_NAMESPACE = "http://www.w3.org/2000/xmlns/";      ///< of the prefix "xmlns"
 
-} // namespace Xml
-} // namespace Tarvel
+} // namespace Tarvel::Xml

@@ -6,8 +6,7 @@
 
 #include <tarvel/xml/parser.h>
 
-namespace Tarvel {
-namespace Xml {
+namespace Tarvel::Xml {
 
 void SourceCursor::SkipUncommonCharacter() {
   std::size_t offset = GetOffset(m_next);
@@ -87,5 +86,4 @@ void SourceCursor::Refuse(Refusal refusal, const char *place, std::string_view f
   Xml::Refuse(refusal, m_source, GetOffset(place), found, alsoFound);
 }
 
-} // namespace Xml
-} // namespace Tarvel
+} // namespace Tarvel::Xml

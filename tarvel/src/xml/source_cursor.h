@@ -14,8 +14,7 @@
 #include <functional>
 #include <string_view>
 
-namespace Tarvel {
-namespace Xml {
+namespace Tarvel::Xml {
 
 /// What an ASCII character can be, as bits. Only white space and the characters of names belong to the grammar; a plain
 /// character is one that its surroundings pass over without a look at it.
@@ -258,5 +257,4 @@ private:
   bool m_isAscii = false;
 };
 
-} // namespace Xml
-} // namespace Tarvel
+} // namespace Tarvel::Xml

@@ -11,8 +11,7 @@
 #include <memory>
 #include <string_view>
 
-namespace Tarvel {
-namespace Xml {
+namespace Tarvel::Xml {
 
 /// A text in which nothing was replaced is a view of the source. What replaces a part of the source is never longer than
 /// that part, so that one buffer as long as the rest of the source, made when it is first needed, has room for all texts
@@ -74,5 +73,4 @@ private:
   char *m_text = nullptr; // the current text begins there
 };
 
-} // namespace Xml
-} // namespace Tarvel
+} // namespace Tarvel::Xml

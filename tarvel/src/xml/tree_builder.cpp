@@ -8,8 +8,7 @@
 #include <functional>
 #include <utility>
 
-namespace Tarvel {
-namespace Xml {
+namespace Tarvel::Xml {
 
 namespace {
 
@@ -104,5 +103,4 @@ std::string_view TreeBuilder::Store(std::string_view text) {
   return IsInSource(text) ? text : m_arena->Copy(text);
 }
 
-} // namespace Xml
-} // namespace Tarvel
+} // namespace Tarvel::Xml

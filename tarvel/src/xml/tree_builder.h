@@ -9,8 +9,7 @@
 
 #include <string_view>
 
-namespace Tarvel {
-namespace Xml {
+namespace Tarvel::Xml {
 
 /// Texts that lie in the document's source are used where they are; the others are copied into the arena of the tree.
 class TreeBuilder final : public XMLHandler {
@@ -34,5 +33,4 @@ private:
   std::string_view m_source;
 };
 
-} // namespace Xml
-} // namespace Tarvel
+} // namespace Tarvel::Xml

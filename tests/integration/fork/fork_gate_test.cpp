@@ -15,8 +15,7 @@
 #include <pthread.h>
 #include <thread>
 
-namespace Tarvel {
-namespace System {
+namespace Tarvel::System {
 namespace {
 
 using Testing::RunInChild;
@@ -202,5 +201,4 @@ TEST(ForkGate, ForkHandlersOfTheHostMayComputeOnTheThreadThatForks) {
 }
 
 } // namespace
-} // namespace System
-} // namespace Tarvel
+} // namespace Tarvel::System

@@ -13,8 +13,7 @@
 #include <string>
 #include <utility>
 
-namespace Tarvel {
-namespace System {
+namespace Tarvel::System {
 namespace {
 
 using Testing::EventCount;
@@ -114,5 +113,4 @@ TEST(ThreadPoolAfterFork, TheChildsCopyOfAPoolIsDroppedWithoutWaitingForTheParen
 }
 
 } // namespace
-} // namespace System
-} // namespace Tarvel
+} // namespace Tarvel::System

@@ -1,4 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
+
 #include "integration/gssapi/gss_acceptor.h"
 
 #include "gss_status.h"

@@ -1,4 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
+
 #include "integration/gssapi/negotiating_server.h"
 
 #include <tarvel/core/string_util.h>

@@ -1,4 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
+
 #include "integration/gssapi/service_world.h"
 
 #include <ssoclient/holder_of_key_config.h>

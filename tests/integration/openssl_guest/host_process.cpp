@@ -1,4 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
+
 #include "integration/openssl_guest/host_process.h"
 
 #include <array>

@@ -1,4 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
+
 #include "integration/out_of_memory/failing_heap.h"
 
 #include "support/refused_memory.h"

@@ -1,4 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
+
 #include "integration/service/service_client.h"
 
 #include <ssoclient/create_saml_token.h>

@@ -1,4 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
+
 #include "integration/service/wrong_answers.h"
 
 #include <ssoclient/exceptions.h>

@@ -1,4 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
+
 #include "integration/service_load/canned_service.h"
 
 #include "exchange/request.h"

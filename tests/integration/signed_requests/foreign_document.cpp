@@ -1,4 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
+
 #include "integration/signed_requests/foreign_document.h"
 
 #include <libxml/parser.h>

@@ -1,4 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
+
 #include "compose/advice_elements.h"
 
 #include "unit/compose/wire_uris.h"

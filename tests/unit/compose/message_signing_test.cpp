@@ -1,4 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
+
 #include "compose/message_signing.h"
 
 #include "compose/soap_envelope.h"

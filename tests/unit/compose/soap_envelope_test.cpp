@@ -1,4 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
+
 #include "compose/soap_envelope.h"
 
 #include "unit/compose/wire_uris.h"

@@ -1,4 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
+
 #include "exchange/request.h"
 
 #include "exchange/spnego_response.h"

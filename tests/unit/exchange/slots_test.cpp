@@ -1,7 +1,8 @@
 // SPDX-License-Identifier: Apache-2.0
+
 #include "exchange/request_builder.h"
 #include "exchange/response_handler.h"
-#include "exchange/transport.h"
+#include "transport/transport.h"
 
 #include "support/virtual_slot.h"
 

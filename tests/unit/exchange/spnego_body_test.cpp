@@ -1,4 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
+
 #include "exchange/spnego_body.h"
 
 #include <gtest/gtest.h>

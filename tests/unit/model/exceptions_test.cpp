@@ -1,4 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
+
 #include <ssoclient/exceptions.h>
 
 #include "support/throws_message.h"

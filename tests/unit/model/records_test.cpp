@@ -1,4 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
+
 #include <ssoclient/create_saml_token.h>
 #include <ssoclient/holder_of_key_config.h>
 #include <ssoclient/negotiation_handler.h>

@@ -1,4 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
+
 #include "support/counting_token.h"
 #include "support/data_file.h"
 #include "support/operation_outcome.h"

@@ -1,4 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
+
 #include "support/identity.h"
 #include "support/posting_server.h"
 #include "support/soap_responses.h"

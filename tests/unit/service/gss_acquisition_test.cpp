@@ -1,4 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
+
 #include "support/data_file.h"
 #include "support/fixed_environment.h"
 #include "support/recorded_log.h"

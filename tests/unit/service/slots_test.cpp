@@ -1,4 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
+
 #include "support/virtual_slot.h"
 
 #include <ssoclient/security_token_service.h>

@@ -1,4 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
+
 #include "service/sync_to_async_call.h"
 
 #include "support/counting_token.h"

@@ -6,8 +6,7 @@
 
 #include <string>
 
-namespace Tarvel {
-namespace Http {
+namespace Tarvel::Http {
 namespace {
 
 TEST(FindCharset, ReadsTheParameterInAnyWayOfWritingIt) {
@@ -116,5 +115,4 @@ TEST(RecodeToUtf8, LeavesADeclarationOfAnotherEncodingAndWhatIsNoDeclaration) {
 }
 
 } // namespace
-} // namespace Http
-} // namespace Tarvel
+} // namespace Tarvel::Http

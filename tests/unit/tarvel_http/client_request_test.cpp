@@ -10,8 +10,7 @@
 
 #include <string>
 
-namespace Tarvel {
-namespace Http {
+namespace Tarvel::Http {
 namespace {
 
 const std::string BAD_PATH =
@@ -115,5 +114,4 @@ TEST(CreateHttpRequest, LetsNothingIntoTheRequestLineThatIsNotOfIt) {
 }
 
 } // namespace
-} // namespace Http
-} // namespace Tarvel
+} // namespace Tarvel::Http

@@ -15,8 +15,7 @@
 #include <ostream>
 #include <string>
 
-namespace Tarvel {
-namespace Http {
+namespace Tarvel::Http {
 namespace {
 
 constexpr std::int64_t SECOND = 1000000;
@@ -276,5 +275,4 @@ INSTANTIATE_TEST_SUITE_P(
                     DateCase{"", std::nullopt}, DateCase{" ,;-", std::nullopt}));
 
 } // namespace
-} // namespace Http
-} // namespace Tarvel
+} // namespace Tarvel::Http

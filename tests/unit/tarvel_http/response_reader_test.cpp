@@ -11,8 +11,7 @@
 #include <string>
 #include <string_view>
 
-namespace Tarvel {
-namespace Http {
+namespace Tarvel::Http {
 namespace {
 
 /// Feeds `bytes` in pieces of `pieceLength` and then the end of the connection.
@@ -393,5 +392,4 @@ TEST(ResponseReader, ExpectsNoBodyForAnAnswerToHead) {
 }
 
 } // namespace
-} // namespace Http
-} // namespace Tarvel
+} // namespace Tarvel::Http

@@ -9,8 +9,7 @@
 #include <ostream>
 #include <string>
 
-namespace Tarvel {
-namespace Http {
+namespace Tarvel::Http {
 namespace {
 
 struct GoodUrl {
@@ -199,5 +198,4 @@ TEST(ParseHttpURL, RefusesAnyPrefixOfAUrlThatNamesNoHost) {
 }
 
 } // namespace
-} // namespace Http
-} // namespace Tarvel
+} // namespace Tarvel::Http

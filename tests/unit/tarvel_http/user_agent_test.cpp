@@ -21,8 +21,7 @@
 #include <string_view>
 #include <utility>
 
-namespace Tarvel {
-namespace Http {
+namespace Tarvel::Http {
 namespace {
 
 constexpr std::int64_t LONG = 60 * 1000000;
@@ -421,5 +420,4 @@ TEST_F(UserAgentTest, StartsARequestOnlyOnce) {
 }
 
 } // namespace
-} // namespace Http
-} // namespace Tarvel
+} // namespace Tarvel::Http

@@ -10,9 +10,7 @@
 #include <utility>
 #include <vector>
 
-namespace Tarvel {
-namespace Xml {
-namespace Security {
+namespace Tarvel::Xml::Security {
 namespace {
 
 using ::Testing::ParseDocument;
@@ -42,6 +40,4 @@ TEST(PlanSearches, SearchesOnceForAnIdentifierHoweverOftenItIsRepeated) {
 }
 
 } // namespace
-} // namespace Security
-} // namespace Xml
-} // namespace Tarvel
+} // namespace Tarvel::Xml::Security

@@ -14,8 +14,7 @@
 #include <thread>
 #include <vector>
 
-namespace Tarvel {
-namespace Service {
+namespace Tarvel::Service {
 namespace {
 
 constexpr int LEVEL_WARNING = 8;
@@ -184,5 +183,4 @@ TEST_F(LoggerTest, TwoThreadsLogWhileTheSinkIsReplaced) {
 }
 
 } // namespace
-} // namespace Service
-} // namespace Tarvel
+} // namespace Tarvel::Service

@@ -12,8 +12,7 @@
 #include <cstddef>
 #include <string>
 
-namespace Tarvel {
-namespace Ssl {
+namespace Tarvel::Ssl {
 namespace {
 
 using Testing::CreateTrustingContext;
@@ -200,5 +199,4 @@ TEST(SessionCache, IsBounded) {
 }
 
 } // namespace
-} // namespace Ssl
-} // namespace Tarvel
+} // namespace Tarvel::Ssl

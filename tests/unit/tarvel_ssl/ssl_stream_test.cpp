@@ -23,8 +23,7 @@
 #include <string>
 #include <vector>
 
-namespace Tarvel {
-namespace Ssl {
+namespace Tarvel::Ssl {
 namespace {
 
 using Testing::Completion;
@@ -572,5 +571,4 @@ TEST(SSLStreamDeathTest, TheProcessMayEndWhileHandshakesGoOn) {
 }
 
 } // namespace
-} // namespace Ssl
-} // namespace Tarvel
+} // namespace Tarvel::Ssl

@@ -15,8 +15,7 @@
 #include <string>
 #include <vector>
 
-namespace Tarvel {
-namespace Ssl {
+namespace Tarvel::Ssl {
 namespace {
 
 using Testing::CreateTrustingContext;
@@ -201,5 +200,4 @@ TEST(SSLContext, AKeyThatIsNotTheCertificatesIsRefused) {
 }
 
 } // namespace
-} // namespace Ssl
-} // namespace Tarvel
+} // namespace Tarvel::Ssl

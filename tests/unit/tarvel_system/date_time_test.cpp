@@ -12,8 +12,7 @@
 #include <limits>
 #include <random>
 
-namespace Tarvel {
-namespace System {
+namespace Tarvel::System {
 namespace {
 
 constexpr std::int64_t SECOND = 1'000'000;
@@ -352,5 +351,4 @@ TEST(DateTime, IsWrittenAsAMessageArgumentAndInLogLines) {
 }
 
 } // namespace
-} // namespace System
-} // namespace Tarvel
+} // namespace Tarvel::System

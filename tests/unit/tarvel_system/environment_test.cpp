@@ -10,8 +10,7 @@
 #include <limits>
 #include <thread>
 
-namespace Tarvel {
-namespace System {
+namespace Tarvel::System {
 namespace {
 
 /// Later than any clock that this test can run under is likely to be.
@@ -64,5 +63,4 @@ TEST(ScopedEnvironment, ClockSaturatesLikeEveryDateTime) {
 }
 
 } // namespace
-} // namespace System
-} // namespace Tarvel
+} // namespace Tarvel::System

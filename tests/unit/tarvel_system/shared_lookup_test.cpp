@@ -19,8 +19,7 @@
 #include <thread>
 #include <vector>
 
-namespace Tarvel {
-namespace System {
+namespace Tarvel::System {
 namespace {
 
 using Testing::Completion;
@@ -344,5 +343,4 @@ TEST(SharedLookup, OfManyThreadsAnswersEachRequestOnce) {
 }
 
 } // namespace
-} // namespace System
-} // namespace Tarvel
+} // namespace Tarvel::System

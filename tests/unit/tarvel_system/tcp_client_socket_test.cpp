@@ -20,8 +20,7 @@
 #include <unistd.h>
 #include <vector>
 
-namespace Tarvel {
-namespace System {
+namespace Tarvel::System {
 namespace {
 
 using Testing::Completion;
@@ -393,5 +392,4 @@ TEST(StreamCanceller, IsDoneOnceTheConnectHasEnded) {
 }
 
 } // namespace
-} // namespace System
-} // namespace Tarvel
+} // namespace Tarvel::System

@@ -23,8 +23,7 @@
 #include <string>
 #include <vector>
 
-namespace Tarvel {
-namespace System {
+namespace Tarvel::System {
 namespace {
 
 using Testing::Completion;
@@ -287,5 +286,4 @@ TEST_P(ThreadPoolCeiling, FiveHundredItemsThatWaitForTheNetworkEnd) {
 INSTANTIATE_TEST_SUITE_P(Ceilings, ThreadPoolCeiling, testing::Values(1, 2, 8, 256), testing::PrintToStringParamName());
 
 } // namespace
-} // namespace System
-} // namespace Tarvel
+} // namespace Tarvel::System

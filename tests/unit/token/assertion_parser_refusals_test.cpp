@@ -1,4 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
+
 #include "support/parsed_document.h"
 #include "support/throws_message.h"
 #include "token/assertion_parser.h"

@@ -1,4 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
+
 #include <ssoclient/create_saml_token.h>
 
 #include "support/data_file.h"

@@ -1,4 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
+
 #include "token/token_checks.h"
 
 #include "support/throws_message.h"

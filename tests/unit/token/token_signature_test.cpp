@@ -1,4 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
+
 #include "token/token_signature.h"
 
 #include "support/parsed_document.h"

@@ -1,4 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
+
 #include "unmet_request.h"
 
 #include <gmock/gmock.h>

@@ -1,4 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
+
 #include "xml/qualified_name.h"
 
 #include "support/parsed_document.h"

@@ -10,8 +10,7 @@
 
 #include <string>
 
-namespace SsoClient {
-namespace Gssapi {
+namespace SsoClient::Gssapi {
 
 /// The client has no credentials to negotiate with: no ticket, an expired one, a cache or keytab that cannot be read, or
 /// a key that the realm does not take. Nothing has been sent to the service.
@@ -30,5 +29,4 @@ class SSOCLIENT_GSSAPI_API GssLimitException : public GssNegotiationException {
   TARVEL_EXCEPTION_BODY(GssLimitException, GssNegotiationException);
 };
 
-} // namespace Gssapi
-} // namespace SsoClient
+} // namespace SsoClient::Gssapi

@@ -11,8 +11,7 @@
 #include <memory>
 #include <string>
 
-namespace SsoClient {
-namespace Gssapi {
+namespace SsoClient::Gssapi {
 
 /// Who negotiates with whom, by what credentials, and for how long at most. All texts are without null characters.
 struct SpnegoSettings {
@@ -72,5 +71,4 @@ protected:
 ///         character in it, and limits that are not positive.
 SSOCLIENT_GSSAPI_API std::shared_ptr<SpnegoHandler> CreateSpnegoHandler(const SpnegoSettings &settings);
 
-} // namespace Gssapi
-} // namespace SsoClient
+} // namespace SsoClient::Gssapi

@@ -15,8 +15,7 @@
 #include <string_view>
 #include <vector>
 
-namespace Tarvel {
-namespace Crypto {
+namespace Tarvel::Crypto {
 
 /// Something wrong with a certificate, a key or a file that holds them; the message says what and where, with the
 /// cryptographic library's own words. All that uses that library can also raise two exceptions that say nothing about what it
@@ -68,5 +67,4 @@ TARVEL_API CertificateList CreateCertificatesFromPem(std::string_view pem);
 /// @throws CryptoException as above; the message begins with the path.
 TARVEL_API CertificateList LoadCertificates(const std::string &path);
 
-} // namespace Crypto
-} // namespace Tarvel
+} // namespace Tarvel::Crypto

@@ -12,8 +12,7 @@
 #include <string>
 #include <string_view>
 
-namespace Tarvel {
-namespace Crypto {
+namespace Tarvel::Crypto {
 
 /// A passphrase that is missing or wrong.
 class TARVEL_API WrongPassphraseException : public CryptoException {
@@ -78,5 +77,4 @@ TARVEL_API KeyStore LoadKeyStore(const std::string &path, const PassphraseCallba
 /// @throws KeyMismatchException unless `key` is the private key of `certificate`.
 TARVEL_API void RequireKeyMatchesCertificate(const PrivateKey &key, const Certificate &certificate);
 
-} // namespace Crypto
-} // namespace Tarvel
+} // namespace Tarvel::Crypto

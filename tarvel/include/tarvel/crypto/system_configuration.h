@@ -6,8 +6,7 @@
 
 #include <tarvel/core/export.h>
 
-namespace Tarvel {
-namespace Crypto {
+namespace Tarvel::Crypto {
 
 /// From now on, certificates, keys, signatures and TLS use OpenSSL as the machine has configured it: `openssl.cnf`, or the
 /// file that the environment variable OPENSSL_CONF names, with its providers (FIPS, PKCS#11, TPM), its properties and its TLS
@@ -23,5 +22,4 @@ namespace Crypto {
 /// @throws OutOfMemoryException
 TARVEL_API void UseSystemConfiguration();
 
-} // namespace Crypto
-} // namespace Tarvel
+} // namespace Tarvel::Crypto

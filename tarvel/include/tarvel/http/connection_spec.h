@@ -13,8 +13,7 @@
 #include <functional>
 #include <string>
 
-namespace Tarvel {
-namespace Http {
+namespace Tarvel::Http {
 
 /// Opens connections to one endpoint. Immutable; safe on any thread.
 class TARVEL_API ConnectionSpec : public Object {
@@ -54,5 +53,4 @@ protected:
   ~CustomConnectionSpec() override;
 };
 
-} // namespace Http
-} // namespace Tarvel
+} // namespace Tarvel::Http

@@ -11,8 +11,7 @@
 #include <string>
 #include <string_view>
 
-namespace Tarvel {
-namespace Http {
+namespace Tarvel::Http {
 
 /// Cookies by RFC 6265, for one user agent, at most 50 of 4096 bytes each. One deviation: a cookie goes back to the host
 /// that set it and to no other, also when its Domain attribute names a domain above that host, because telling domains
@@ -37,5 +36,4 @@ protected:
 ///        stores exist. @throws InvalidArgumentException for a name.
 TARVEL_API void CreateCookieStore(const std::string &name, Ref<CookieStore> &out);
 
-} // namespace Http
-} // namespace Tarvel
+} // namespace Tarvel::Http

@@ -10,8 +10,7 @@
 #include <string>
 #include <string_view>
 
-namespace Tarvel {
-namespace Http {
+namespace Tarvel::Http {
 
 /// A text that is not an http or https URL that can be asked; the message names the URL (without user information, which
 /// may hold a password) and what is wrong with it.
@@ -28,5 +27,4 @@ class TARVEL_API MalformedURLException : public Exception {
 ///         information, or characters that may not stand in a URL. The outputs are left alone then.
 TARVEL_API void ParseHttpURL(std::string_view url, bool &isSecure, std::string &host, int &port, std::string &path);
 
-} // namespace Http
-} // namespace Tarvel
+} // namespace Tarvel::Http

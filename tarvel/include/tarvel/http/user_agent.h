@@ -18,8 +18,7 @@
 #include <string>
 #include <string_view>
 
-namespace Tarvel {
-namespace Http {
+namespace Tarvel::Http {
 
 constexpr std::size_t MAX_HEADER_BYTES = 64u * 1024;      ///< of each response, interim ones too; status line included
 constexpr std::size_t MAX_BODY_BYTES = 16u * 1024 * 1024; ///< of a response
@@ -124,5 +123,4 @@ TARVEL_API void CreateHttpUserAgent(const Ref<ConnectionSpec> &spec, const Ref<C
 /// @throws InvalidArgumentException when either may not stand in a request line.
 TARVEL_API void CreateHttpRequest(std::string_view method, std::string_view path, Ref<ClientRequest> &out);
 
-} // namespace Http
-} // namespace Tarvel
+} // namespace Tarvel::Http

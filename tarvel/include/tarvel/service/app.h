@@ -7,8 +7,7 @@
 #include <tarvel/core/export.h>
 #include <tarvel/service/logger.h>
 
-namespace Tarvel {
-namespace Service {
+namespace Tarvel::Service {
 
 /// The process's one application object.
 class TARVEL_API App {
@@ -27,5 +26,4 @@ protected:
 /// The application object, made on first use; it lives until the process ends. Safe on any thread.
 TARVEL_API App &GetApp();
 
-} // namespace Service
-} // namespace Tarvel
+} // namespace Tarvel::Service

@@ -13,8 +13,7 @@
 #include <string>
 #include <string_view>
 
-namespace Tarvel {
-namespace Service {
+namespace Tarvel::Service {
 
 /// One line for the sink. The texts are valid during the call only.
 struct LogRecord {
@@ -76,5 +75,4 @@ void LogInternal(Logger &logger, int level, std::string_view message, const Args
   logger.Write(level, MessageFormatter::ASPrint(message, args...));
 }
 
-} // namespace Service
-} // namespace Tarvel
+} // namespace Tarvel::Service

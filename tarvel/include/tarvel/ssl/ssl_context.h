@@ -14,8 +14,7 @@
 #include <functional>
 #include <string>
 
-namespace Tarvel {
-namespace Ssl {
+namespace Tarvel::Ssl {
 
 /// A failed handshake or a broken TLS connection; the message names the host and the reason in the TLS library's words.
 class TARVEL_API SSLException : public System::NetworkException {
@@ -77,5 +76,4 @@ protected:
 /// @throws Crypto::CryptoException, InvalidStateException when OpenSSL has cleaned itself up, OutOfMemoryException
 TARVEL_API Ref<SSLContext> CreateSSLContext();
 
-} // namespace Ssl
-} // namespace Tarvel
+} // namespace Tarvel::Ssl

@@ -10,8 +10,7 @@
 #include <functional>
 #include <string>
 
-namespace Tarvel {
-namespace System {
+namespace Tarvel::System {
 
 /// What the platform takes from outside the process's own state. An empty function means the real source.
 struct Environment {
@@ -33,5 +32,4 @@ private:
   const Environment *m_previous;
 };
 
-} // namespace System
-} // namespace Tarvel
+} // namespace Tarvel::System

@@ -7,8 +7,7 @@
 #include <tarvel/core/export.h>
 #include <tarvel/core/ref.h>
 
-namespace Tarvel {
-namespace System {
+namespace Tarvel::System {
 
 /// A handle to started work: a queued function, a pending connect, a pending HTTP request. Dropping the handle does not
 /// stop the work. Safe on any thread.
@@ -25,5 +24,4 @@ protected:
   ~ScheduledItem() override;
 };
 
-} // namespace System
-} // namespace Tarvel
+} // namespace Tarvel::System

@@ -13,8 +13,7 @@
 #include <functional>
 #include <string>
 
-namespace Tarvel {
-namespace System {
+namespace Tarvel::System {
 
 /// A failure of the network: a name that does not resolve, a connection that fails or breaks, a cancelled operation.
 /// The message names the endpoint and the reason.
@@ -95,5 +94,4 @@ TARVEL_API Ref<TcpClientSocket> CreateTcpClientSocket();
 /// A handle that cancels by closing `stream`.
 TARVEL_API Ref<ScheduledItem> CreateStreamCanceller(const Ref<Stream> &stream);
 
-} // namespace System
-} // namespace Tarvel
+} // namespace Tarvel::System

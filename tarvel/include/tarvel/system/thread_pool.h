@@ -12,8 +12,7 @@
 #include <cstddef>
 #include <functional>
 
-namespace Tarvel {
-namespace System {
+namespace Tarvel::System {
 
 /// Runs queued functions on threads of its own. Threads are made on demand up to a ceiling and end when they have been
 /// idle for a while. The queue is bounded by memory alone. Network completions never run here, so work that waits for
@@ -54,5 +53,4 @@ TARVEL_API Ref<ThreadPool> GetThreadPool();
 TARVEL_API Ref<ThreadPool> CreateThreadPool(std::size_t threadCeiling,
                                             std::chrono::milliseconds idleTime = std::chrono::seconds(10));
 
-} // namespace System
-} // namespace Tarvel
+} // namespace Tarvel::System

@@ -8,8 +8,7 @@
 #include <tarvel/core/ref.h>
 #include <tarvel/xml/node.h>
 
-namespace Tarvel {
-namespace Xml {
+namespace Tarvel::Xml {
 
 /// A whole document; it keeps its tree alive.
 class TARVEL_API Document : public Object {
@@ -25,5 +24,4 @@ protected:
   ~Document() override;
 };
 
-} // namespace Xml
-} // namespace Tarvel
+} // namespace Tarvel::Xml

@@ -18,8 +18,7 @@
 #include <cstdint>
 #include <string_view>
 
-namespace Tarvel {
-namespace Xml {
+namespace Tarvel::Xml {
 
 class DocumentNode;
 class ElementNode;
@@ -273,5 +272,4 @@ TARVEL_API void CreateElementNode(std::string_view prefix, std::string_view loca
 /// A new text node, child of nothing, with an empty value.
 TARVEL_API void CreateTextNode(Ref<TextNode> &out);
 
-} // namespace Xml
-} // namespace Tarvel
+} // namespace Tarvel::Xml

@@ -15,8 +15,7 @@
 #include <string>
 #include <string_view>
 
-namespace Tarvel {
-namespace Xml {
+namespace Tarvel::Xml {
 
 /// A document that is not well-formed (XML 1.0, Namespaces in XML 1.0), or that has what this platform refuses: a document
 /// type declaration, an XML version other than 1.0, an encoding other than UTF-8, or more than one of the limits below.
@@ -98,5 +97,4 @@ protected:
   ~XMLHandler() override;
 };
 
-} // namespace Xml
-} // namespace Tarvel
+} // namespace Tarvel::Xml

@@ -10,8 +10,7 @@
 #include <tuple>
 #include <utility>
 
-namespace Tarvel {
-namespace Xml {
+namespace Tarvel::Xml {
 
 /// A namespace name and a local name; equal when both are equal byte for byte.
 struct QName {
@@ -36,5 +35,4 @@ struct QName {
 /// A name as a message argument: its `ToString` text.
 TARVEL_API std::string FormatMessageArgument(const QName &value);
 
-} // namespace Xml
-} // namespace Tarvel
+} // namespace Tarvel::Xml

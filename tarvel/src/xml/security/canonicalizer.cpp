@@ -9,9 +9,7 @@
 
 #include <utility>
 
-namespace Tarvel {
-namespace Xml {
-namespace Security {
+namespace Tarvel::Xml::Security {
 
 namespace {
 
@@ -46,6 +44,4 @@ Ref<Canonicalizer> CreateCanonicalizer(std::string_view algorithmUri,
   return MakeRef<CanonicalizerImpl>(std::move(method));
 }
 
-} // namespace Security
-} // namespace Xml
-} // namespace Tarvel
+} // namespace Tarvel::Xml::Security

@@ -2,13 +2,9 @@
 
 #include <tarvel/xml/security/exceptions.h>
 
-namespace Tarvel {
-namespace Xml {
-namespace Security {
+namespace Tarvel::Xml::Security {
 
 TARVEL_DEFINE_EXCEPTION(XmlSecurityException)
 TARVEL_DEFINE_EXCEPTION(SignatureSyntaxException)
 
-} // namespace Security
-} // namespace Xml
-} // namespace Tarvel
+} // namespace Tarvel::Xml::Security

@@ -9,9 +9,7 @@
 #include <string>
 #include <utility>
 
-namespace Tarvel {
-namespace Xml {
-namespace Security {
+namespace Tarvel::Xml::Security {
 
 namespace {
 
@@ -120,6 +118,4 @@ Ref<KeyInfoResolver> CreateTrustSetKeyResolver(const KeyInfoResolver::Certificat
   return MakeRef<TrustSetKeyResolver>(trusted);
 }
 
-} // namespace Security
-} // namespace Xml
-} // namespace Tarvel
+} // namespace Tarvel::Xml::Security

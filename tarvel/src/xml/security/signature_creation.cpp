@@ -13,9 +13,7 @@
 
 #include <utility>
 
-namespace Tarvel {
-namespace Xml {
-namespace Security {
+namespace Tarvel::Xml::Security {
 
 namespace {
 
@@ -187,6 +185,4 @@ void CreateBlankSignature(const Ref<ElementNode> &root, std::string_view canonic
   out = MakeRef<BlankSignature>(root, signatureUri, prefix);
 }
 
-} // namespace Security
-} // namespace Xml
-} // namespace Tarvel
+} // namespace Tarvel::Xml::Security

@@ -15,9 +15,7 @@
 
 #include <vector>
 
-namespace Tarvel {
-namespace Xml {
-namespace Security {
+namespace Tarvel::Xml::Security {
 
 namespace {
 
@@ -177,6 +175,4 @@ void CreateSignatureFromDom(const ElementNode &root, const ElementNode &signatur
   out = MakeRef<ParsedSignature>(root, signature);
 }
 
-} // namespace Security
-} // namespace Xml
-} // namespace Tarvel
+} // namespace Tarvel::Xml::Security

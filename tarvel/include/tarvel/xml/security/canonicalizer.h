@@ -13,9 +13,7 @@
 #include <string_view>
 #include <vector>
 
-namespace Tarvel {
-namespace Xml {
-namespace Security {
+namespace Tarvel::Xml::Security {
 
 /// Algorithm URIs of canonicalisation.
 namespace CanonicalizationUri {
@@ -46,6 +44,4 @@ protected:
 TARVEL_API Ref<Canonicalizer> CreateCanonicalizer(std::string_view algorithmUri,
                                                   const std::vector<std::string> &inclusivePrefixes = {});
 
-} // namespace Security
-} // namespace Xml
-} // namespace Tarvel
+} // namespace Tarvel::Xml::Security

@@ -6,9 +6,7 @@
 
 #include <tarvel/core/exception.h>
 
-namespace Tarvel {
-namespace Xml {
-namespace Security {
+namespace Tarvel::Xml::Security {
 
 /// An algorithm outside the profile, a reference that does not resolve to exactly one node, no usable key, a tree without
 /// canonical form, or a failure while signing.
@@ -21,6 +19,4 @@ class TARVEL_API SignatureSyntaxException : public XmlSecurityException {
   TARVEL_EXCEPTION_BODY(SignatureSyntaxException, XmlSecurityException);
 };
 
-} // namespace Security
-} // namespace Xml
-} // namespace Tarvel
+} // namespace Tarvel::Xml::Security

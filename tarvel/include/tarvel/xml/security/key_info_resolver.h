@@ -11,9 +11,7 @@
 
 #include <vector>
 
-namespace Tarvel {
-namespace Xml {
-namespace Security {
+namespace Tarvel::Xml::Security {
 
 /// Names the certificates whose keys a signature may have been made with. Immutable; safe on any thread.
 class TARVEL_API KeyInfoResolver : public Object {
@@ -34,6 +32,4 @@ protected:
 /// certificates are compared. Null references in `trusted` are passed over, equal certificates count once.
 TARVEL_API Ref<KeyInfoResolver> CreateTrustSetKeyResolver(const KeyInfoResolver::CertificateList &trusted);
 
-} // namespace Security
-} // namespace Xml
-} // namespace Tarvel
+} // namespace Tarvel::Xml::Security

@@ -16,9 +16,7 @@
 #include <string_view>
 #include <vector>
 
-namespace Tarvel {
-namespace Xml {
-namespace Security {
+namespace Tarvel::Xml::Security {
 
 /// Algorithm URIs of signatures, digests and transforms that the profile knows besides canonicalisation.
 namespace SignatureUri {
@@ -104,6 +102,4 @@ TARVEL_API void CreateSignatureFromDom(const ElementNode &root, const ElementNod
 TARVEL_API void CreateBlankSignature(const Ref<ElementNode> &root, std::string_view canonicalizationUri,
                                      std::string_view signatureUri, std::string_view prefix, Ref<Signature> &out);
 
-} // namespace Security
-} // namespace Xml
-} // namespace Tarvel
+} // namespace Tarvel::Xml::Security

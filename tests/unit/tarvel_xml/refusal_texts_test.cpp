@@ -18,8 +18,7 @@
 #include <string>
 #include <vector>
 
-namespace Tarvel {
-namespace Xml {
+namespace Tarvel::Xml {
 namespace {
 
 using ::Testing::ParseDocument;
@@ -312,5 +311,4 @@ TEST(Refusals, AreNotForWhatOnlyLooksAlike) {
 }
 
 } // namespace
-} // namespace Xml
-} // namespace Tarvel
+} // namespace Tarvel::Xml

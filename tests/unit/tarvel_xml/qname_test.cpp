@@ -5,8 +5,7 @@
 
 #include <gtest/gtest.h>
 
-namespace Tarvel {
-namespace Xml {
+namespace Tarvel::Xml {
 namespace {
 
 TEST(QName, IsEqualWhenBothTextsAre) {
@@ -31,5 +30,4 @@ TEST(QName, IsAMessageArgument) {
 }
 
 } // namespace
-} // namespace Xml
-} // namespace Tarvel
+} // namespace Tarvel::Xml

@@ -15,8 +15,7 @@
 #include <type_traits>
 #include <vector>
 
-namespace Tarvel {
-namespace Xml {
+namespace Tarvel::Xml {
 namespace {
 
 using ::Testing::DescribeTree;
@@ -519,5 +518,4 @@ TEST(CheckedDowncasts, AreNullForNullAndForOtherKinds) {
 }
 
 } // namespace
-} // namespace Xml
-} // namespace Tarvel
+} // namespace Tarvel::Xml

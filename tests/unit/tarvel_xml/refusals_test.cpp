@@ -13,8 +13,7 @@
 #include <memory>
 #include <string>
 
-namespace Tarvel {
-namespace Xml {
+namespace Tarvel::Xml {
 namespace {
 
 using ::Testing::ParseDocument;
@@ -267,5 +266,4 @@ TEST(ParseDocument, EndsInATreeOrItsExceptionForEveryChangedByteOfAToken) {
 }
 
 } // namespace
-} // namespace Xml
-} // namespace Tarvel
+} // namespace Tarvel::Xml

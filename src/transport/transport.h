@@ -13,11 +13,9 @@
 #include <functional>
 #include <memory>
 
-namespace Tarvel {
-namespace System {
+namespace Tarvel::System {
 class ScheduledItem;
-} // namespace System
-} // namespace Tarvel
+} // namespace Tarvel::System
 
 namespace SsoClient {
 

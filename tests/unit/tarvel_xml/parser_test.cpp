@@ -13,8 +13,7 @@
 #include <stdexcept>
 #include <string>
 
-namespace Tarvel {
-namespace Xml {
+namespace Tarvel::Xml {
 namespace {
 
 using ::Testing::DescribeTree;
@@ -237,5 +236,4 @@ TEST(XMLParser, PrintsNothing) {
 }
 
 } // namespace
-} // namespace Xml
-} // namespace Tarvel
+} // namespace Tarvel::Xml

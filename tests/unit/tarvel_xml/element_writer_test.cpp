@@ -11,8 +11,7 @@
 #include <string>
 #include <string_view>
 
-namespace Tarvel {
-namespace Xml {
+namespace Tarvel::Xml {
 namespace {
 
 using ::Testing::DescribeTree;
@@ -191,5 +190,4 @@ TEST(WriteTo, GivesTheSameTreeBackForEachToken) {
 }
 
 } // namespace
-} // namespace Xml
-} // namespace Tarvel
+} // namespace Tarvel::Xml

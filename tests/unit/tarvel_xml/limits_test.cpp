@@ -9,8 +9,7 @@
 
 #include <string>
 
-namespace Tarvel {
-namespace Xml {
+namespace Tarvel::Xml {
 namespace {
 
 using ::Testing::ParseDocument;
@@ -202,5 +201,4 @@ TEST(ParserLimits, ReadsLargeDocumentsOfSmallPartsInLinearTime) {
 }
 
 } // namespace
-} // namespace Xml
-} // namespace Tarvel
+} // namespace Tarvel::Xml
