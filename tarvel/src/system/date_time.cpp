@@ -2,9 +2,9 @@
 
 #include <tarvel/system/date_time.h>
 
-#include "system/current_environment.h"
+#include "core/current_environment.h"
+#include "core/fork_gate.h"
 #include "system/date_time_text.h"
-#include "system/fork_gate.h"
 
 #include <algorithm>
 #include <chrono>
