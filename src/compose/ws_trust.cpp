@@ -11,13 +11,9 @@
 #include <tarvel/core/string_util.h>
 #include <tarvel/system/date_time.h>
 
-#include <limits>
-
 namespace SsoClient {
 
 namespace {
-
-constexpr std::int64_t MICROSECONDS_PER_SECOND = 1000000;
 
 std::string BooleanText(bool value) {
   return value ? "true" : "false";
@@ -41,16 +37,6 @@ XMLBuilderPtr TokenTargetBuilder(const std::string &name, const SamlToken &token
   auto target = std::make_shared<XMLCompositeBuilder>(ElementBuilder("wst", name));
   target->Add(InsertSamlTokenBuilder(token));
   return target;
-}
-
-/// `utcMicroseconds` and `seconds` later, or the nearest number to that.
-std::int64_t AddSeconds(std::int64_t utcMicroseconds, std::int64_t seconds) {
-  std::int64_t result = 0;
-  if (__builtin_mul_overflow(seconds, MICROSECONDS_PER_SECOND, &result) ||
-      __builtin_add_overflow(utcMicroseconds, result, &result)) {
-    return seconds < 0 ? std::numeric_limits<std::int64_t>::min() : std::numeric_limits<std::int64_t>::max();
-  }
-  return result;
 }
 
 } // namespace
@@ -100,8 +86,7 @@ XMLBuilderPtr ValidateSecurityTokenBuilder(const SamlToken &token) {
 
 XMLBuilderPtr WssuLifetimeBuilder(std::int64_t seconds) {
   const Tarvel::System::DateTime now = Tarvel::System::GetUtcDateTime();
-  const Tarvel::System::DateTime expires =
-      Tarvel::System::DateTimeFromUtc(AddSeconds(now.GetUtcTime(), seconds), false);
+  const Tarvel::System::DateTime expires = now.PlusSeconds(seconds);
   auto lifetime = std::make_shared<XMLCompositeBuilder>(
       ElementBuilder("wst", "Lifetime", {{"xmlns:wsu", std::string(Namespaces::WSU)}}));
   lifetime->Add(TextElementBuilder("wsu", "Created", DateTimeFormatter(now)))

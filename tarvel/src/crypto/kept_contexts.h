@@ -4,7 +4,7 @@
 
 #pragma once
 
-#include "system/thread_lane.h"
+#include "core/thread_shard.h"
 
 #include <array>
 #include <atomic>
@@ -64,13 +64,13 @@ private:
   using Pointer = typename Handle::pointer;
   using Slot = std::atomic<Pointer>;
 
-  struct alignas(System::LANE_ALIGNMENT) Lane {
+  struct alignas(SHARD_ALIGNMENT) Lane {
     std::array<Slot, KINDS> slots{};
   };
 
   /// `distance` is counted in lanes from the calling thread's own.
   Slot &GetSlot(std::size_t distance, std::size_t kind) noexcept {
-    return m_lanes[(System::GetThreadLane(LANES) + distance) % LANES].slots[kind];
+    return m_lanes[(GetThreadShard(LANES) + distance) % LANES].slots[kind];
   }
 
   std::array<Lane, LANES> m_lanes{};

@@ -4,7 +4,7 @@
 
 #pragma once
 
-#include "system/fork_gate.h"
+#include "core/fork_gate.h"
 
 namespace Tarvel::Crypto {
 
@@ -30,7 +30,7 @@ public:
 private:
   const Function m_function;
   void *const m_owner;
-  const unsigned m_generation = System::GetForkGeneration();
+  const unsigned m_generation = GetForkGeneration();
   // In a list of all notices, guarded by its mutex.
   OpenSslEndNotice *m_previous = nullptr;
   OpenSslEndNotice *m_next = nullptr;

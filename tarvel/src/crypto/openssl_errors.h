@@ -4,7 +4,7 @@
 
 #pragma once
 
-#include "system/fork_gate.h"
+#include "core/fork_gate.h"
 
 #include <string>
 
@@ -40,7 +40,7 @@ public:
   std::string Describe(const std::string &message) const;
 
 private:
-  const System::Computation m_computing;
+  const Computation m_computing;
   /// Takes the errors off the queue.
   void Collect() const;
   void Note(unsigned long code, const char *data, int flags) const;

@@ -2,10 +2,10 @@
 
 #include "crypto/openssl_use.h"
 
+#include "core/thread_shard.h"
 #include "crypto/library_context.h"
 #include "crypto/openssl_end.h"
 #include "crypto/openssl_errors.h"
-#include "system/thread_lane.h"
 
 #include <tarvel/core/exception.h>
 
@@ -30,7 +30,7 @@ constexpr std::chrono::milliseconds MAX_WAIT{500};
 constexpr std::chrono::microseconds WAIT_STEP{100};
 
 /// The uses that are going on, counted by the lanes of the threads: one count for all would be what they queue up for.
-struct alignas(System::LANE_ALIGNMENT) Lane {
+struct alignas(SHARD_ALIGNMENT) Lane {
   std::atomic<std::uint32_t> uses{0};
 };
 
@@ -47,7 +47,7 @@ std::atomic<Abandoned *> abandoned{nullptr};
 
 /// Where the use is counted that has begun; null when none may begin any more.
 std::atomic<std::uint32_t> *TryBegin() noexcept {
-  std::atomic<std::uint32_t> &uses = lanes[System::GetThreadLane(lanes.size())].uses;
+  std::atomic<std::uint32_t> &uses = lanes[GetThreadShard(lanes.size())].uses;
   uses.fetch_add(1);
   if (ended.load()) {
     uses.fetch_sub(1);
@@ -102,7 +102,7 @@ void OpenSslUse::Abandon(void *object) noexcept {
 
 void OpenSslUse::Prepare() {
   // Around the once, or a thread within it could wait for a fork that waits for a thread that waits for the once.
-  const System::Computation computing;
+  const Computation computing;
   static std::once_flag registered;
   std::call_once(registered, [] {
     // In this order, for it is OpenSSL's own initialisation that arranges for the clean-up.

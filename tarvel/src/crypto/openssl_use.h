@@ -4,7 +4,7 @@
 
 #pragma once
 
-#include "system/fork_gate.h"
+#include "core/fork_gate.h"
 
 #include <atomic>
 #include <cstdint>
@@ -43,7 +43,7 @@ public:
   static void Abandon(void *object) noexcept;
 
 private:
-  const System::Computation m_computing;
+  const Computation m_computing;
   std::atomic<std::uint32_t> *m_count; // of the lane in which it began; null when it is not allowed
 };
 

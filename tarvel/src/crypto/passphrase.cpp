@@ -2,7 +2,7 @@
 
 #include "crypto/passphrase.h"
 
-#include "system/fork_gate.h"
+#include "core/fork_gate.h"
 
 #include <tarvel/core/secure_wipe.h>
 
@@ -17,7 +17,7 @@ std::string Passphrase::Ask() {
   m_use.Suspend();
   try {
     std::string answer = [this] {
-      const System::HostCall call;
+      const HostCall call;
       return m_ask();
     }();
     m_use.Resume();

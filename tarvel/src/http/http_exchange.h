@@ -4,9 +4,9 @@
 
 #pragma once
 
+#include "core/fork_gate.h"
 #include "http/client_request_impl.h"
 #include "http/response_reader.h"
-#include "system/fork_gate.h"
 
 #include <tarvel/http/connection_spec.h>
 #include <tarvel/http/cookie_store.h>
@@ -69,9 +69,9 @@ private:
                 const Ref<ClientResponse> &response) noexcept;
 
   /// Whether this is the copy of a parent's exchange, of which nothing more will be heard here.
-  bool IsOfParent() const noexcept { return m_generation != System::GetForkGeneration(); }
+  bool IsOfParent() const noexcept { return m_generation != GetForkGeneration(); }
 
-  const unsigned m_generation = System::GetForkGeneration();
+  const unsigned m_generation = GetForkGeneration();
   const Ref<ConnectionSpec> m_spec;
   const Ref<CookieStore> m_cookies;
   const std::string m_endpoint; // for messages
@@ -83,8 +83,7 @@ private:
   ResponseReader m_reader;
   bool m_isSecure = false;
 
-  mutable System::ForkSafeMutex
-      m_mutex; // guards all that follows; never held while a handler or a completion function runs
+  mutable ForkSafeMutex m_mutex; // guards all that follows; never held while a handler or a completion function runs
   std::condition_variable_any m_done;
   Ref<System::ScheduledItem> m_connecting;
   Ref<System::Stream> m_stream;

@@ -4,8 +4,8 @@
 
 #pragma once
 
+#include "core/fork_gate.h"
 #include "ssl/ssl_handles.h"
-#include "system/fork_gate.h"
 
 #include <cstddef>
 #include <list>
@@ -46,8 +46,8 @@ private:
   /// Under the lock: a child begins with none, for what its parent has is its parent's to use.
   void ForgetThoseOfParent();
 
-  mutable System::ForkSafeMutex m_mutex;                 // guards all that follows
-  unsigned m_generation = System::GetForkGeneration();   // of the process that the entries belong to
+  mutable ForkSafeMutex m_mutex;                         // guards all that follows
+  unsigned m_generation = GetForkGeneration();           // of the process that the entries belong to
   Entries m_entries;                                     // the oldest first
   std::multimap<std::string, Entries::iterator> m_byKey; // within a key, the oldest first
 };

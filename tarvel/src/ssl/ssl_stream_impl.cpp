@@ -4,8 +4,8 @@
 
 #include "crypto/openssl_errors.h"
 #include "crypto/openssl_use.h"
+#include "service/uncaught_exception.h"
 #include "system/io_engine.h"
-#include "system/uncaught_exception.h"
 
 #include <tarvel/core/exception.h>
 #include <tarvel/core/string_util.h>
@@ -23,7 +23,7 @@
 
 namespace Tarvel::Ssl {
 
-using System::LogUncaughtException;
+using Service::LogUncaughtException;
 
 namespace {
 
@@ -49,7 +49,7 @@ std::string DescribeSubject(X509 *certificate) {
 
 template <typename Handler, typename... Args>
 void CallGuarded(const Handler &handler, const Args &...args) noexcept {
-  const System::HostCall call;
+  const HostCall call;
   try {
     handler(args...);
   } catch (...) {
@@ -74,7 +74,7 @@ std::optional<std::string> DescribeLowerFailure(const Exception *exception) noex
 /// Calls `handler` with `arguments` and an `InvalidStateException` for `reason`, on an I/O thread.
 template <typename Handler, typename... Arguments>
 void PostRefusal(Handler handler, const char *reason, Arguments... arguments) {
-  const System::Computation computing;
+  const Computation computing;
   boost::asio::post(System::GetIoContext(),
                     [handler = std::move(handler), failure = InvalidStateException(reason), arguments...] {
                       CallGuarded(handler, arguments..., static_cast<const Exception *>(&failure));
@@ -98,13 +98,13 @@ public:
   }
 
   void Run() const noexcept {
-    const unsigned generation = System::GetForkGeneration();
+    const unsigned generation = GetForkGeneration();
     if (m_handshake) {
       CallGuarded(m_handshake, m_handshakeFailure.get());
     }
     for (const Transfer *transfer : {&m_write, &m_read}) {
       // A handler may have forked: in the child none of the others is called.
-      if (transfer->handler && generation == System::GetForkGeneration()) {
+      if (transfer->handler && generation == GetForkGeneration()) {
         CallGuarded(transfer->handler, transfer->count, transfer->failure.get());
       }
     }
@@ -150,7 +150,7 @@ void SSLStreamImpl::AsyncHandshake(const std::string &host, const std::string &p
     PostRefusal(std::move(handler), OF_PARENT);
     return;
   }
-  const std::lock_guard<System::ForkSafeMutex> lock(m_mutex);
+  const std::lock_guard<ForkSafeMutex> lock(m_mutex);
   if (m_stage != Stage::FRESH) {
     auto failure =
         m_failure ? m_failure : std::make_shared<InvalidStateException>("The TLS handshake was started before");
@@ -173,7 +173,7 @@ void SSLStreamImpl::AsyncReadSome(char *buffer, std::size_t length, TransferHand
     PostRefusal(std::move(handler), OF_PARENT, std::size_t{0});
     return;
   }
-  const std::lock_guard<System::ForkSafeMutex> lock(m_mutex);
+  const std::lock_guard<ForkSafeMutex> lock(m_mutex);
   if (m_read || length == 0) {
     PostRefusal(std::move(handler), "Another read is pending, or the read is one of no bytes", std::size_t{0});
     return;
@@ -187,7 +187,7 @@ void SSLStreamImpl::AsyncWrite(const char *bytes, std::size_t length, TransferHa
     PostRefusal(std::move(handler), OF_PARENT, std::size_t{0});
     return;
   }
-  const std::lock_guard<System::ForkSafeMutex> lock(m_mutex);
+  const std::lock_guard<ForkSafeMutex> lock(m_mutex);
   if (m_write) {
     PostRefusal(std::move(handler), "Another write is pending", std::size_t{0});
     return;
@@ -203,7 +203,7 @@ void SSLStreamImpl::Close() noexcept {
   }
   {
     const Crypto::OpenSslUse use;
-    const std::lock_guard<System::ForkSafeMutex> lock(m_mutex);
+    const std::lock_guard<ForkSafeMutex> lock(m_mutex);
     if (!use) {
       MarkEnded();
     } else {
@@ -256,7 +256,7 @@ void SSLStreamImpl::Advance(const Step &step) noexcept {
   Completions done;
   {
     const Crypto::OpenSslUse use;
-    const std::lock_guard<System::ForkSafeMutex> lock(m_mutex);
+    const std::lock_guard<ForkSafeMutex> lock(m_mutex);
     if (!use) {
       MarkEnded();
       FailPending(m_failure, done);
@@ -280,7 +280,7 @@ void SSLStreamImpl::Advance(const Step &step) noexcept {
 template <typename Step>
 void SSLStreamImpl::AdvanceOnIoThread(Step step) noexcept {
   try {
-    const System::Computation computing;
+    const Computation computing;
     boost::asio::dispatch(System::GetIoContext(), [self = Ref(this), step = std::move(step)] { self->Advance(step); });
   } catch (...) {
     Advance([](Completions &) { throw OutOfMemoryException(); }); // here, for there is no memory to go elsewhere
@@ -292,7 +292,7 @@ void SSLStreamImpl::AdvanceOnIoThread(Step step) noexcept {
 void SSLStreamImpl::OnOpenSslEnd(void *stream) noexcept {
   auto &self = *static_cast<SSLStreamImpl *>(stream);
   {
-    const std::lock_guard<System::ForkSafeMutex> lock(self.m_mutex);
+    const std::lock_guard<ForkSafeMutex> lock(self.m_mutex);
     self.MarkEnded();
   }
   self.m_lower->Close();

@@ -5,12 +5,12 @@
 
 #pragma once
 
+#include "core/fork_gate.h"
 #include "crypto/openssl_end.h"
 #include "crypto/openssl_errors.h"
 #include "ssl/server_identity.h"
 #include "ssl/ssl_context_impl.h"
 #include "ssl/ssl_handles.h"
-#include "system/fork_gate.h"
 
 #include <tarvel/ssl/ssl_context.h>
 
@@ -70,7 +70,7 @@ private:
   using LowerFailure = std::optional<std::string>;
 
   /// Whether this is the copy of a parent's stream: the connection is the parent's to use, and so are its handlers.
-  bool IsOfParent() const noexcept { return m_generation != System::GetForkGeneration(); }
+  bool IsOfParent() const noexcept { return m_generation != GetForkGeneration(); }
 
   void PostPump();
   /// Takes `step` under the lock, or fails what is pending once OpenSSL is gone; then calls the handlers. What `step` throws
@@ -116,7 +116,7 @@ private:
   Failure MakeFailureOrNoMemory(const char *reason) const noexcept;
   void FailPending(const Failure &failure, Completions &done) noexcept;
 
-  const unsigned m_generation = System::GetForkGeneration();
+  const unsigned m_generation = GetForkGeneration();
   const Ref<SSLContextImpl> m_context;
   const Ref<System::Stream> m_lower;
   const std::string m_endpoint;
@@ -124,7 +124,7 @@ private:
   const Failure m_processEnds = std::make_shared<InvalidStateException>(Crypto::OpenSslUse::ENDED);
   std::atomic<bool> m_wasResumed{false};
 
-  System::ForkSafeMutex m_mutex; // guards all that follows; never held while a handler runs
+  ForkSafeMutex m_mutex; // guards all that follows; never held while a handler runs
   Stage m_stage = Stage::FRESH;
   Failure m_failure;
   std::string m_host; // as given; the endpoint until then

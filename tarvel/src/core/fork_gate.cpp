@@ -1,8 +1,8 @@
 // SPDX-License-Identifier: Apache-2.0
 
-#include "system/fork_gate.h"
+#include "core/fork_gate.h"
 
-#include "system/thread_lane.h"
+#include "core/thread_shard.h"
 
 #include <array>
 #include <atomic>
@@ -12,75 +12,76 @@
 #include <thread>
 #include <utility>
 
-namespace Tarvel::System {
+namespace Tarvel {
 
 namespace {
 
 constexpr std::chrono::microseconds WAIT_STEP{50};
-/// How often a thread steps that forks within a computation of its own. Others may wait for what it holds, and then never end.
+/// How many steps a thread waits that forks within its own computation. Others may wait for a lock that it holds, and would
+/// never end.
 constexpr int MAX_STEPS_WITHIN = 2000;
 
-/// The threads that compute, counted by lanes: one count for all would be what they queue up for.
-struct alignas(LANE_ALIGNMENT) Lane {
+/// The number of threads of one shard that compute: a single counter would be a point of contention.
+struct alignas(SHARD_ALIGNMENT) Shard {
   std::atomic<std::uint32_t> threads{0};
 };
 
-// Constant-initialised and never destroyed. Lanes and forking are sequentially consistent: either the thread that begins
-// sees the fork, or the fork sees the thread.
-constexpr std::size_t LANES = 16;
-std::array<Lane, LANES> lanes;
+// Constant-initialised and never destroyed. Access to `shards` and `forking` is sequentially consistent: either the thread
+// that begins sees the fork, or the fork sees the thread.
+constexpr std::size_t SHARDS = 16;
+std::array<Shard, SHARDS> shards;
 std::atomic<int> forking{0};
 std::atomic<unsigned> generation{0};
 std::atomic<ForkListener *> listener{nullptr};
 std::mutex forks;     // held during a fork: there is one at a time
-bool isQuiet = false; // during a fork: nobody else computes
+bool isQuiet = false; // during a fork: no other thread computes
 std::atomic<bool> registers{false};
 
 thread_local unsigned depth = 0;           // of the computations that the thread has begun
-thread_local bool isForkingThread = false; // it waits for nobody: it is the one for whom all wait
+thread_local bool isForkingThread = false; // which never waits: all others wait for it
 
-std::atomic<std::uint32_t> &OwnLane() noexcept {
-  return lanes[GetThreadLane(LANES)].threads;
+std::atomic<std::uint32_t> &OwnShard() noexcept {
+  return shards[GetThreadShard(SHARDS)].threads;
 }
 
 void BeginComputing() noexcept {
-  std::atomic<std::uint32_t> &lane = OwnLane();
+  std::atomic<std::uint32_t> &shard = OwnShard();
   for (;;) {
-    lane.fetch_add(1);
+    shard.fetch_add(1);
     if (forking.load() == 0 || isForkingThread) {
       return;
     }
-    lane.fetch_sub(1);
+    shard.fetch_sub(1);
     forking.wait(1);
   }
 }
 
 void EndComputing() noexcept {
-  OwnLane().fetch_sub(1);
+  OwnShard().fetch_sub(1);
 }
 
 std::uint32_t CountComputing() noexcept {
   std::uint32_t threads = 0;
-  for (const Lane &lane : lanes) {
-    threads += lane.threads.load();
+  for (const Shard &shard : shards) {
+    threads += shard.threads.load();
   }
   return threads;
 }
 
-/// 1 when the calling thread computes, and so forks within a computation of its own: in a signal handler, or in a module that
-/// OpenSSL has loaded. Such a child executes a program.
+/// 1 when the calling thread computes, and so forks within its own computation: in a signal handler, or in a module that
+/// OpenSSL has loaded. Such a child executes another program.
 std::uint32_t CountOwn() noexcept {
   return depth > 0 ? 1 : 0;
 }
 
-/// One fork at a time. A thread that waits for its turn does not count, or it would be waited for.
+/// One fork at a time. A thread that waits for its turn does not count as computing, or the fork under way would wait for it.
 void LockForks() noexcept {
   if (depth > 0) {
     EndComputing();
   }
   forks.lock();
   if (depth > 0) {
-    OwnLane().fetch_add(1);
+    OwnShard().fetch_add(1);
   }
 }
 
@@ -122,10 +123,10 @@ void AfterForkInParent() noexcept {
 void AfterForkInChild() noexcept {
   generation.fetch_add(1);
   // A thread that was about to begin may have counted itself for a moment.
-  for (Lane &lane : lanes) {
-    lane.threads.store(0);
+  for (Shard &shard : shards) {
+    shard.threads.store(0);
   }
-  OwnLane().store(CountOwn());
+  OwnShard().store(CountOwn());
   ForkListener *const listening = listener.exchange(nullptr);
   if (listening && isQuiet) {
     listening->AfterForkInChild();
@@ -133,13 +134,13 @@ void AfterForkInChild() noexcept {
   EndFork();
 }
 
-/// With the first computation, and so before the first thread of our own.
+/// Called with the first computation, and so before our first thread starts.
 void RegisterOnce() noexcept {
   if (registers.load(std::memory_order_relaxed) || registers.exchange(true)) {
     return;
   }
   if (pthread_atfork(BeforeFork, AfterForkInParent, AfterForkInChild) != 0) {
-    registers.store(false); // without memory; the next computation tries again
+    registers.store(false); // no memory; the next computation tries again
   }
 }
 
@@ -172,7 +173,7 @@ HostCall::~HostCall() {
 }
 
 void ForkSafeMutex::lock() {
-  const Computation computing; // if the lock fails, it is as if nothing had begun
+  const Computation computing; // ends the computation again if the lock fails
   m_mutex.lock();
   ++depth;
 }
@@ -196,4 +197,4 @@ bool IsForkUnderWay() noexcept {
   return forking.load() != 0;
 }
 
-} // namespace Tarvel::System
+} // namespace Tarvel

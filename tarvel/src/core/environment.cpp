@@ -1,13 +1,13 @@
 // SPDX-License-Identifier: Apache-2.0
 
-#include <tarvel/system/environment.h>
+#include <tarvel/core/environment.h>
 
-#include "system/current_environment.h"
+#include "core/current_environment.h"
 
 #include <atomic>
 #include <utility>
 
-namespace Tarvel::System {
+namespace Tarvel {
 
 namespace {
 
@@ -28,4 +28,4 @@ ScopedEnvironment::~ScopedEnvironment() {
   delete m_environment;
 }
 
-} // namespace Tarvel::System
+} // namespace Tarvel

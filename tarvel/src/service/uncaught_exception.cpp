@@ -1,9 +1,9 @@
 // SPDX-License-Identifier: Apache-2.0
 
-#include "system/uncaught_exception.h"
+#include "service/uncaught_exception.h"
 
 #include "core/demangle.h"
-#include "system/fork_gate.h"
+#include "core/fork_gate.h"
 
 #include <tarvel/core/string_util.h>
 #include <tarvel/service/app.h>
@@ -13,7 +13,7 @@
 #include <string>
 #include <typeinfo>
 
-namespace Tarvel::System {
+namespace Tarvel::Service {
 
 namespace {
 
@@ -25,15 +25,14 @@ std::string DescribeCurrentException() {
   } catch (const std::exception &exception) {
     return Demangle(typeid(exception).name()) + ": " + StringUtil::Shorten(exception.what());
   } catch (...) {
-    return "an object that is no exception";
+    return "an object that is not a std::exception";
   }
 }
 
-Service::Logger &PlatformLogger() {
+Logger &PlatformLogger() {
   const Computation computing;
-  // Never destroyed, as the threads that log never end before the process does.
-  static Service::Logger *const logger =
-      Service::Logger::CreateLogger(Service::GetApp().GetRootLogger(), "Tarvel", LEVEL_WARNING).Detach();
+  // Never destroyed: the threads that log run until the process ends.
+  static Logger *const logger = Logger::CreateLogger(GetApp().GetRootLogger(), "Tarvel", LEVEL_WARNING).Detach();
   return *logger;
 }
 
@@ -43,8 +42,8 @@ void LogUncaughtException(std::string_view place) noexcept {
   try {
     LogInternal(PlatformLogger(), LEVEL_WARNING, "An exception left %1: %2", place, DescribeCurrentException());
   } catch (...) {
-    // Out of memory while logging: the line is lost, the thread is not.
+    // Out of memory while logging: the line is lost, but the thread goes on.
   }
 }
 
-} // namespace Tarvel::System
+} // namespace Tarvel::Service
