@@ -4,7 +4,7 @@
 
 #include "crypto/library_context.h"
 #include "crypto/openssl_errors.h"
-#include "crypto/openssl_use.h"
+#include "crypto/openssl_guard.h"
 
 #include <tarvel/core/ref.h>
 
@@ -26,9 +26,9 @@ namespace {
 constexpr std::size_t MAX_CURVE_NAME_BYTES = 80;
 
 CertificateHandle Decode(const std::vector<std::uint8_t> &der) {
-  OpenSslUse::Prepare();
-  const OpenSslUse use;
-  use.Require();
+  OpenSslGuard::Prepare();
+  const OpenSslGuard guard;
+  guard.Require();
   const OpenSslErrorScope errors;
   if (der.empty() || der.size() > static_cast<std::size_t>(std::numeric_limits<long>::max())) {
     throw CryptoException("Certificate of " + std::to_string(der.size()) + " bytes does not decode");
@@ -122,7 +122,7 @@ bool IsExponentSound(EVP_PKEY *key) {
   return BN_is_odd(exponent.get()) && !BN_is_one(exponent.get()) && !BN_is_negative(exponent.get());
 }
 
-std::string TakeBioText(BIO *bio) {
+std::string CopyBioText(BIO *bio) {
   char *text = nullptr;
   const long length = BIO_get_mem_data(bio, &text);
   return length > 0 ? std::string(text, static_cast<std::size_t>(length)) : std::string();
@@ -139,22 +139,22 @@ BioHandle NewMemoryBio() {
 std::string DescribeName(const X509_NAME *name) {
   // RFC 2253 allows UTF-8 as it is; OpenSSL's flags would have every byte of it escaped.
   constexpr unsigned long FLAGS = XN_FLAG_RFC2253 & ~static_cast<unsigned long>(ASN1_STRFLGS_ESC_MSB);
-  const OpenSslUse use;
-  use.Require();
+  const OpenSslGuard guard;
+  guard.Require();
   const OpenSslErrorScope errors;
   const BioHandle bio = NewMemoryBio();
   if (X509_NAME_print_ex(bio.get(), name, 0, FLAGS) < 0) {
     errors.Throw("Distinguished name cannot be written");
   }
-  return TakeBioText(bio.get());
+  return CopyBioText(bio.get());
 }
 
 } // namespace
 
 CertificateImpl::CertificateImpl(const std::uint8_t *data, std::size_t length)
     : m_der(data, data + length), m_native(Decode(m_der)) {
-  const OpenSslUse use;
-  use.Require();
+  const OpenSslGuard guard;
+  guard.Require();
   RequireCanonical(m_native.get(), m_der);
   m_notBefore = ToUtcMicroseconds(X509_get0_notBefore(m_native.get()));
   m_notAfter = ToUtcMicroseconds(X509_get0_notAfter(m_native.get()));
@@ -192,14 +192,14 @@ std::string CertificateImpl::GetSha256Thumbprint() const {
 }
 
 std::string CertificateImpl::ToPem() const {
-  const OpenSslUse use;
-  use.Require();
+  const OpenSslGuard guard;
+  guard.Require();
   const OpenSslErrorScope errors;
   const BioHandle bio = NewMemoryBio();
   if (PEM_write_bio_X509(bio.get(), m_native.get()) != 1) {
     errors.Throw("Certificate cannot be written as PEM");
   }
-  return TakeBioText(bio.get());
+  return CopyBioText(bio.get());
 }
 
 const CertificateImpl &AsImpl(const Certificate &certificate) {

@@ -54,11 +54,11 @@ const EVP_MD *GetDigestMethod(DigestAlgorithm algorithm) {
 }
 
 Digest::Digest(DigestAlgorithm algorithm) : m_algorithm(algorithm), m_context(nullptr) {
-  OpenSslUse::Prepare();
-  m_use.Require();
+  OpenSslGuard::Prepare();
+  m_guard.Require();
   m_errors.emplace();
   const EVP_MD *const method = GetDigestMethod(algorithm);
-  DigestContextHandle context = IsKept(algorithm) ? keptContexts.Take(0) : nullptr;
+  DigestContextHandle context = IsKept(algorithm) ? keptContexts.Acquire(0) : nullptr;
   if (!context) {
     context.reset(EVP_MD_CTX_new());
   }
@@ -84,7 +84,7 @@ void Digest::Finish(std::uint8_t *out) {
     m_errors->Throw("Failed to finish a digest");
   }
   if (IsKept(m_algorithm)) {
-    keptContexts.Put(0, DigestContextHandle(AsDigestContext(std::exchange(m_context, nullptr))));
+    keptContexts.Return(0, DigestContextHandle(AsDigestContext(std::exchange(m_context, nullptr))));
   }
 }
 

@@ -5,7 +5,7 @@
 #pragma once
 
 #include "crypto/openssl_errors.h"
-#include "crypto/openssl_use.h"
+#include "crypto/openssl_guard.h"
 
 #include <cstddef>
 #include <cstdint>
@@ -40,8 +40,8 @@ public:
   void Finish(std::uint8_t *out);
 
 private:
-  const OpenSslUse m_use;
-  std::optional<OpenSslErrorScope> m_errors; // always there, but begun only when OpenSSL may be called
+  const OpenSslGuard m_guard;
+  std::optional<OpenSslErrorScope> m_errors; // set by the constructor once it knows that OpenSSL may be called
   const DigestAlgorithm m_algorithm;
   void *m_context; // EVP_MD_CTX; null once it is finished
 };

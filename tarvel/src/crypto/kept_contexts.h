@@ -23,8 +23,8 @@ public:
   KeptContexts(const KeptContexts &) = delete;
   KeptContexts &operator=(const KeptContexts &) = delete;
 
-  /// A kept context of that kind; null when none is kept.
-  Handle Take(std::size_t kind) noexcept {
+  /// A kept context of that kind; null if there is none.
+  Handle Acquire(std::size_t kind) noexcept {
     for (std::size_t distance = 0; distance < LANES; ++distance) {
       Slot &slot = GetSlot(distance, kind);
       if (!slot.load(std::memory_order_relaxed)) {
@@ -37,8 +37,8 @@ public:
     return nullptr;
   }
 
-  /// Keeps `context` for the next taker, or frees it when enough are kept already.
-  void Put(std::size_t kind, Handle context) noexcept {
+  /// Keeps `context` for reuse, or frees it if enough are kept already.
+  void Return(std::size_t kind, Handle context) noexcept {
     for (std::size_t distance = 0; distance < LANES; ++distance) {
       Pointer expected = nullptr;
       if (GetSlot(distance, kind)

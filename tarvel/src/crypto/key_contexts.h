@@ -23,14 +23,14 @@ public:
   KeyContexts &operator=(const KeyContexts &) = delete;
   ~KeyContexts() { m_contexts.FreeAll(); }
 
-  /// A context set up for `scheme` and `algorithm`; null when none is kept.
-  KeyContextHandle Take(SignatureScheme scheme, DigestAlgorithm algorithm) noexcept {
-    return m_contexts.Take(KindOf(scheme, algorithm));
+  /// A context set up for `scheme` and `algorithm`; null if none is kept.
+  KeyContextHandle Acquire(SignatureScheme scheme, DigestAlgorithm algorithm) noexcept {
+    return m_contexts.Acquire(KindOf(scheme, algorithm));
   }
 
-  /// Keeps `context` for the next taker, or frees it when enough are kept already.
-  void Put(SignatureScheme scheme, DigestAlgorithm algorithm, KeyContextHandle context) noexcept {
-    m_contexts.Put(KindOf(scheme, algorithm), std::move(context));
+  /// Keeps `context` for reuse, or frees it if enough are kept already.
+  void Return(SignatureScheme scheme, DigestAlgorithm algorithm, KeyContextHandle context) noexcept {
+    m_contexts.Return(KindOf(scheme, algorithm), std::move(context));
   }
 
 private:

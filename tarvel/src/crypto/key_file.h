@@ -31,7 +31,7 @@ private:
 /// What `function` returns; its `CryptoException` or `IOException` comes as the same class, the message beginning with
 /// `path`.
 template <typename Function>
-auto NamingPath(const std::string &path, Function function) {
+auto WithPathInErrors(const std::string &path, Function function) {
   try {
     return function();
   } catch (const WrongPassphraseException &error) {

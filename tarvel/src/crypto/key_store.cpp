@@ -96,11 +96,11 @@ Ref<const Certificate> ToCertificate(X509 *native) {
 } // namespace
 
 KeyStore CreateKeyStoreFromPkcs12(std::string_view der, const PassphraseCallback &passphrase) {
-  OpenSslUse::Prepare();
-  OpenSslUse use;
-  use.Require();
+  OpenSslGuard::Prepare();
+  OpenSslGuard guard;
+  guard.Require();
   const Pkcs12Handle store = Decode(der);
-  Passphrase secret(passphrase, use);
+  Passphrase secret(passphrase, guard);
   NativeKeyStore native = Open(store.get(), FindPassphrase(store.get(), secret));
   if (!native.key) {
     throw NoKeyException("There is no private key in the PKCS#12 key store");

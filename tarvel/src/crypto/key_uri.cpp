@@ -88,12 +88,12 @@ bool IsKeyUri(const std::string &text) {
 }
 
 Ref<const PrivateKey> LoadPrivateKeyFromUri(const std::string &uri, const PassphraseCallback &passphrase) {
-  OpenSslUse::Prepare();
-  OpenSslUse use;
-  use.Require();
+  OpenSslGuard::Prepare();
+  OpenSslGuard guard;
+  guard.Require();
   const OpenSslErrorScope errors;
-  PassphraseQuestion question{Passphrase(passphrase, use), false, nullptr};
-  // Without a method of ours, a loader would ask on the terminal of the host.
+  PassphraseQuestion question{Passphrase(passphrase, guard), false, nullptr};
+  // Without this method, a loader would ask on the host's terminal.
   const UiMethodHandle ui(UI_UTIL_wrap_read_pem_callback(AnswerPassphrase, 0));
   if (!ui) {
     throw OutOfMemoryException();

@@ -3,7 +3,7 @@
 #include "crypto/library_context.h"
 
 #include "crypto/openssl_errors.h"
-#include "crypto/openssl_use.h"
+#include "crypto/openssl_guard.h"
 
 #include <tarvel/crypto/certificate.h>
 #include <tarvel/crypto/system_configuration.h>
@@ -66,7 +66,7 @@ void InitialiseOpenSsl() {
       throw OutOfMemoryException();
     }
     if (!isUsable) {
-      throw InvalidStateException(OpenSslUse::ENDED);
+      throw InvalidStateException(OpenSslGuard::ENDED);
     }
     errors.Throw("Cannot initialise OpenSSL");
   }
@@ -86,9 +86,9 @@ void UseSystemConfiguration() {
     throw InvalidStateException(
         "The system's configuration of OpenSSL is asked for too late: OpenSSL is in use already");
   }
-  OpenSslUse::Prepare();
-  const OpenSslUse use;
-  use.Require();
+  OpenSslGuard::Prepare();
+  const OpenSslGuard guard;
+  guard.Require();
 }
 
 } // namespace Tarvel::Crypto

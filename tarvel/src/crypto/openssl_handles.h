@@ -4,7 +4,7 @@
 
 #pragma once
 
-#include "crypto/openssl_use.h"
+#include "crypto/openssl_guard.h"
 
 #include <openssl/bio.h>
 #include <openssl/ec.h>
@@ -23,10 +23,10 @@ template <auto FREE>
 struct OpenSslDeleter {
   template <typename T>
   void operator()(T *handle) const noexcept {
-    if (const OpenSslUse use; use) {
+    if (const OpenSslGuard guard; guard) {
       FREE(handle);
     } else {
-      OpenSslUse::Abandon(handle);
+      OpenSslGuard::Abandon(handle);
     }
   }
 };

@@ -14,16 +14,16 @@ Passphrase::~Passphrase() {
 
 // Asking may take as long as somebody types, and may start a program that asks.
 std::string Passphrase::Ask() {
-  m_use.Suspend();
+  m_guard.Suspend();
   try {
     std::string answer = [this] {
       const System::HostCall call;
       return m_ask();
     }();
-    m_use.Resume();
+    m_guard.Resume();
     return answer;
   } catch (...) {
-    m_use.Resume();
+    m_guard.Resume();
     throw;
   }
 }
@@ -38,7 +38,7 @@ const std::string &Passphrase::Get() {
     m_text.swap(answer); // needs no memory, so that nothing is thrown before the answer is wiped
     SecureWipe(answer);  // a short text is not moved but copied: what is left of the answer is a secret too
   }
-  m_use.Require();
+  m_guard.Require();
   return m_text;
 }
 

@@ -4,7 +4,7 @@
 
 #pragma once
 
-#include "crypto/openssl_use.h"
+#include "crypto/openssl_guard.h"
 
 #include <tarvel/crypto/private_key.h>
 
@@ -15,8 +15,8 @@ namespace Tarvel::Crypto {
 /// Asks its callback at most once, on the thread that first needs the passphrase.
 class Passphrase {
 public:
-  /// `ask`, and `use` in the middle of which it is called, must live as long as this.
-  Passphrase(const PassphraseCallback &ask, OpenSslUse &use) : m_ask(ask), m_use(use) {}
+  /// `ask`, and `guard` in the middle of which it is called, must live as long as this.
+  Passphrase(const PassphraseCallback &ask, OpenSslGuard &guard) : m_ask(ask), m_guard(guard) {}
   Passphrase(const Passphrase &) = delete;
   Passphrase &operator=(const Passphrase &) = delete;
   ~Passphrase();
@@ -30,7 +30,7 @@ private:
   std::string Ask();
 
   const PassphraseCallback &m_ask;
-  OpenSslUse &m_use;
+  OpenSslGuard &m_guard;
   bool m_asked = false;
   std::string m_text;
 };

@@ -173,10 +173,10 @@ PrivateKey::~PrivateKey() = default;
 
 Ref<const PrivateKey> CreatePrivateKey(std::string_view text, const PassphraseCallback &passphrase) {
   constexpr char DER_SEQUENCE = 0x30;
-  OpenSslUse::Prepare();
-  OpenSslUse use;
-  use.Require();
-  Passphrase secret(passphrase, use);
+  OpenSslGuard::Prepare();
+  OpenSslGuard guard;
+  guard.Require();
+  Passphrase secret(passphrase, guard);
   if (PemReader::LooksLikePem(text)) {
     return MakeRef<PrivateKeyImpl>(DecodePem(text, secret));
   }
@@ -188,15 +188,15 @@ Ref<const PrivateKey> CreatePrivateKey(std::string_view text, const PassphraseCa
 
 Ref<const PrivateKey> LoadPrivateKey(const std::string &pathOrUri, const PassphraseCallback &passphrase) {
   if (IsKeyUri(pathOrUri)) {
-    return NamingPath(pathOrUri, [&] { return LoadPrivateKeyFromUri(pathOrUri, passphrase); });
+    return WithPathInErrors(pathOrUri, [&] { return LoadPrivateKeyFromUri(pathOrUri, passphrase); });
   }
   const KeyFileText file(pathOrUri);
   return NamingPath(pathOrUri, [&] { return CreatePrivateKey(file.Get(), passphrase); });
 }
 
 void RequireKeyMatchesCertificate(const PrivateKey &key, const Certificate &certificate) {
-  const OpenSslUse use;
-  use.Require();
+  const OpenSslGuard guard;
+  guard.Require();
   const OpenSslErrorScope errors;
   EVP_PKEY *const publicKey = AsImpl(certificate).GetNativeKey();
   if (!publicKey || EVP_PKEY_eq(publicKey, AsImpl(key).GetNative()) != 1) {

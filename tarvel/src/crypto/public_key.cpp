@@ -6,8 +6,8 @@
 #include "crypto/digest_method.h"
 #include "crypto/library_context.h"
 #include "crypto/openssl_errors.h"
+#include "crypto/openssl_guard.h"
 #include "crypto/openssl_handles.h"
-#include "crypto/openssl_use.h"
 #include "crypto/private_key_impl.h"
 
 #include <openssl/rsa.h>
@@ -29,7 +29,7 @@ bool IsCurve(KeyKind kind) {
   return kind == KeyKind::EC_P256 || kind == KeyKind::EC_P384 || kind == KeyKind::EC_P521;
 }
 
-bool FitsScheme(KeyKind kind, SignatureScheme scheme) {
+bool MatchesScheme(KeyKind kind, SignatureScheme scheme) {
   return IsRsaScheme(scheme) ? kind == KeyKind::RSA : IsCurve(kind);
 }
 
@@ -147,13 +147,13 @@ bool VerifyDigest(const Certificate &certificate, SignatureScheme scheme, Digest
   const CertificateImpl &impl = AsImpl(certificate);
   const std::size_t numberBytes = BytesOf(impl.GetKeyBits());
   const std::size_t expectedLength = IsRsaScheme(scheme) ? numberBytes : 2 * numberBytes;
-  if (!FitsScheme(impl.GetKeyKind(), scheme) || signatureLength != expectedLength) {
+  if (!MatchesScheme(impl.GetKeyKind(), scheme) || signatureLength != expectedLength) {
     return false;
   }
-  const OpenSslUse use;
-  use.Require();
+  const OpenSslGuard guard;
+  guard.Require();
   KeyContexts &contexts = impl.GetVerifyContexts();
-  KeyContextHandle context = contexts.Take(scheme, algorithm);
+  KeyContextHandle context = contexts.Acquire(scheme, algorithm);
   if (!context) {
     context = NewVerifyContext(impl.GetNativeKey(), scheme, algorithm);
   }
@@ -164,21 +164,21 @@ bool VerifyDigest(const Certificate &certificate, SignatureScheme scheme, Digest
     const std::vector<std::uint8_t> der = EncodeEcdsaValue(signature, numberBytes);
     genuine = Verify(context.get(), algorithm, digest, der.data(), der.size());
   }
-  contexts.Put(scheme, algorithm, std::move(context));
+  contexts.Return(scheme, algorithm, std::move(context));
   return genuine;
 }
 
 std::vector<std::uint8_t> SignDigest(const PrivateKey &key, SignatureScheme scheme, DigestAlgorithm algorithm,
                                      const std::uint8_t *digest) {
-  const OpenSslUse use;
-  use.Require();
+  const OpenSslGuard guard;
+  guard.Require();
   const OpenSslErrorScope errors;
   if (key.GetAlgorithm() != (IsRsaScheme(scheme) ? "RSA" : "EC")) {
     throw CryptoException("A key of algorithm " + key.GetAlgorithm() + " cannot make a signature of this scheme");
   }
   const PrivateKeyImpl &impl = AsImpl(key);
   KeyContexts &contexts = impl.GetSignContexts();
-  KeyContextHandle context = contexts.Take(scheme, algorithm);
+  KeyContextHandle context = contexts.Acquire(scheme, algorithm);
   if (!context) {
     context = NewSignContext(impl.GetNative(), scheme, algorithm);
   }
@@ -190,7 +190,7 @@ std::vector<std::uint8_t> SignDigest(const PrivateKey &key, SignatureScheme sche
   if (EVP_PKEY_sign(context.get(), value.data(), &length, digest, DigestBytes(algorithm)) <= 0) {
     errors.Throw("Failed to sign");
   }
-  contexts.Put(scheme, algorithm, std::move(context));
+  contexts.Return(scheme, algorithm, std::move(context));
   value.resize(length);
   return IsRsaScheme(scheme) ? value : DecodeEcdsaValue(value, BytesOf(key.GetBits()));
 }

@@ -3,7 +3,7 @@
 #include "ssl/ssl_stream_impl.h"
 
 #include "crypto/openssl_errors.h"
-#include "crypto/openssl_use.h"
+#include "crypto/openssl_guard.h"
 #include "system/io_engine.h"
 #include "system/uncaught_exception.h"
 
@@ -129,11 +129,11 @@ SSLStreamImpl::SSLStreamImpl(const Ref<SSLContextImpl> &context, const Ref<Syste
 
 SSLStreamImpl::~SSLStreamImpl() {
   m_endNotice.Withdraw();
-  const Crypto::OpenSslUse use;
+  const Crypto::OpenSslGuard use;
   if (!use) {
-    Crypto::OpenSslUse::Abandon(m_connection.release());
+    Crypto::OpenSslGuard::Abandon(m_connection.release());
     for (SessionHandle &session : m_newSessions) {
-      Crypto::OpenSslUse::Abandon(session.release());
+      Crypto::OpenSslGuard::Abandon(session.release());
     }
     return;
   }
@@ -202,7 +202,7 @@ void SSLStreamImpl::Close() noexcept {
     return;
   }
   {
-    const Crypto::OpenSslUse use;
+    const Crypto::OpenSslGuard use;
     const std::lock_guard<System::ForkSafeMutex> lock(m_mutex);
     if (!use) {
       MarkEnded();
@@ -255,7 +255,7 @@ template <typename Step>
 void SSLStreamImpl::Advance(const Step &step) noexcept {
   Completions done;
   {
-    const Crypto::OpenSslUse use;
+    const Crypto::OpenSslGuard use;
     const std::lock_guard<System::ForkSafeMutex> lock(m_mutex);
     if (!use) {
       MarkEnded();

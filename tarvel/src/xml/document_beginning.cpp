@@ -56,7 +56,7 @@ private:
   bool m_isAfterSpace = false;
 };
 
-void TakeEncoding(SourceCursor &cursor, std::string_view encoding) {
+void ApplyEncoding(SourceCursor &cursor, std::string_view encoding) {
   if (EqualsIgnoringCase(encoding, "US-ASCII")) {
     cursor.RequireAscii();
   } else if (!EqualsIgnoringCase(encoding, "UTF-8")) {
@@ -74,7 +74,7 @@ void ReadDeclaration(SourceCursor &cursor) {
     cursor.Refuse(Refusal::OTHER_VERSION, version->data(), *version);
   }
   if (const std::optional<std::string_view> encoding = declaration.Read("encoding")) {
-    TakeEncoding(cursor, *encoding);
+    ApplyEncoding(cursor, *encoding);
   }
   const std::optional<std::string_view> standalone = declaration.Read("standalone");
   if (standalone && *standalone != "yes" && *standalone != "no") {
@@ -83,9 +83,8 @@ void ReadDeclaration(SourceCursor &cursor) {
   declaration.End();
 }
 
-/// Whether the name of a target, of which "<?xml" may be the beginning only, goes on with `rest`: "<?xml-stylesheet" begins
-/// an instruction.
-bool GoesOn(std::string_view rest) noexcept {
+/// Whether a target that begins with "xml" continues in `rest`: "<?xml-stylesheet" begins an instruction, not a declaration.
+bool ContinuesTarget(std::string_view rest) noexcept {
   return !rest.empty() &&
          (IsOfClass(rest.front(), NAME) || rest.front() == ':' || static_cast<unsigned char>(rest.front()) >= 0x80);
 }
@@ -120,7 +119,7 @@ void ReadDocumentBeginning(SourceCursor &cursor) {
   if (cursor.IsAtEnd()) {
     cursor.Refuse(Refusal::EMPTY_DOCUMENT, cursor.GetPlace());
   }
-  if (cursor.IsAt(DECLARATION_BEGIN) && !GoesOn(source.substr(markLength + DECLARATION_BEGIN.size()))) {
+  if (cursor.IsAt(DECLARATION_BEGIN) && !ContinuesTarget(source.substr(markLength + DECLARATION_BEGIN.size()))) {
     ReadDeclaration(cursor);
   }
 }

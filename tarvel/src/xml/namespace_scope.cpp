@@ -82,11 +82,11 @@ void NamespaceScope::CheckNames(const std::vector<AttributeEvent> &attributes) {
 
 // Of all pairs that must not be, the one is reported whose second attribute comes first.
 void NamespaceScope::CheckFewNames(const std::vector<AttributeEvent> &attributes) {
-  constexpr std::size_t NOT_SOUGHT = UNKNOWN - 1;
-  std::array<std::size_t, FEW_ATTRIBUTES> namespaces; // each is sought at most once, for the declarations may be many
-  namespaces.fill(NOT_SOUGHT);
+  constexpr std::size_t NOT_LOOKED_UP = UNKNOWN - 1;
+  std::array<std::size_t, FEW_ATTRIBUTES> namespaces; // each is looked up at most once: there may be many declarations
+  namespaces.fill(NOT_LOOKED_UP);
   const auto getNamespace = [&](std::size_t index) {
-    if (namespaces[index] == NOT_SOUGHT) {
+    if (namespaces[index] == NOT_LOOKED_UP) {
       namespaces[index] = FindNamespace(attributes[index].GetPrefix());
     }
     return namespaces[index];

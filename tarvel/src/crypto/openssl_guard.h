@@ -14,12 +14,12 @@ namespace Tarvel::Crypto {
 /// Around short uses of OpenSSL on a thread that nobody joins. OpenSSL's clean-up, which runs when the process ends or the
 /// host asks for it, waits a moment for the uses that are going on; later ones are told to keep away.
 /// Nobody forks during a use.
-class OpenSslUse {
+class OpenSslGuard {
 public:
-  OpenSslUse() noexcept;
-  OpenSslUse(const OpenSslUse &) = delete;
-  OpenSslUse &operator=(const OpenSslUse &) = delete;
-  ~OpenSslUse();
+  OpenSslGuard() noexcept;
+  OpenSslGuard(const OpenSslGuard &) = delete;
+  OpenSslGuard &operator=(const OpenSslGuard &) = delete;
+  ~OpenSslGuard();
 
   /// False once the clean-up has begun: then OpenSSL must not be called any more, not even to free what it made.
   explicit operator bool() const noexcept { return m_count != nullptr; }

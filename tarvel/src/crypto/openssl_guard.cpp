@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 
-#include "crypto/openssl_use.h"
+#include "crypto/openssl_guard.h"
 
 #include "crypto/library_context.h"
 #include "crypto/openssl_end.h"
@@ -70,37 +70,37 @@ void OnCleanUp() noexcept {
 
 } // namespace
 
-OpenSslUse::OpenSslUse() noexcept : m_count(TryBegin()) {}
+OpenSslGuard::OpenSslGuard() noexcept : m_count(TryBegin()) {}
 
-OpenSslUse::~OpenSslUse() {
+OpenSslGuard::~OpenSslGuard() {
   Suspend();
 }
 
-void OpenSslUse::Suspend() noexcept {
+void OpenSslGuard::Suspend() noexcept {
   if (m_count) {
     std::exchange(m_count, nullptr)->fetch_sub(1);
   }
 }
 
-bool OpenSslUse::Resume() noexcept {
+bool OpenSslGuard::Resume() noexcept {
   m_count = TryBegin();
   return m_count != nullptr;
 }
 
-void OpenSslUse::Require() const {
+void OpenSslGuard::Require() const {
   if (!m_count) {
     throw InvalidStateException(ENDED);
   }
 }
 
-void OpenSslUse::Abandon(void *object) noexcept {
+void OpenSslGuard::Abandon(void *object) noexcept {
   if (auto *const entry = new (std::nothrow) Abandoned{object, abandoned.load()}) {
     while (!abandoned.compare_exchange_weak(entry->next, entry)) {
     }
   }
 }
 
-void OpenSslUse::Prepare() {
+void OpenSslGuard::Prepare() {
   // Around the once, or a thread within it could wait for a fork that waits for a thread that waits for the once.
   const System::Computation computing;
   static std::once_flag registered;
