@@ -88,7 +88,7 @@ CertificateList CreateCertificatesFromPem(std::string_view pem) {
 
 CertificateList LoadCertificates(const std::string &path) {
   constexpr char DER_SEQUENCE = 0x30;
-  const KeyFileText file(path);
+  const SecretText file = ReadKeyFile(path);
   const std::string_view text = file.Get();
   return WithPathInErrors(path, [text]() -> CertificateList {
     if (text.starts_with(DER_SEQUENCE) && !PemReader::LooksLikePem(text)) {

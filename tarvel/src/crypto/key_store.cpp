@@ -116,8 +116,8 @@ KeyStore CreateKeyStoreFromPkcs12(std::string_view der, const PassphraseCallback
 }
 
 KeyStore LoadKeyStore(const std::string &path, const PassphraseCallback &passphrase) {
-  const KeyFileText file(path);
-  return NamingPath(path, [&] { return CreateKeyStoreFromPkcs12(file.Get(), passphrase); });
+  const SecretText file = ReadKeyFile(path);
+  return WithPathInErrors(path, [&] { return CreateKeyStoreFromPkcs12(file.Get(), passphrase); });
 }
 
 } // namespace Tarvel::Crypto

@@ -6,6 +6,7 @@
 
 #include "crypto/openssl_guard.h"
 
+#include <tarvel/core/secret_text.h>
 #include <tarvel/crypto/private_key.h>
 
 #include <string>
@@ -19,7 +20,6 @@ public:
   Passphrase(const PassphraseCallback &ask, OpenSslGuard &guard) : m_ask(ask), m_guard(guard) {}
   Passphrase(const Passphrase &) = delete;
   Passphrase &operator=(const Passphrase &) = delete;
-  ~Passphrase();
 
   /// The passphrase, wiped with this object.
   /// @throws WrongPassphraseException when there is no callback; whatever the callback throws; InvalidStateException when
@@ -27,12 +27,12 @@ public:
   const std::string &Get();
 
 private:
-  std::string Ask();
+  SecretText Ask();
 
   const PassphraseCallback &m_ask;
   OpenSslGuard &m_guard;
   bool m_asked = false;
-  std::string m_text;
+  SecretText m_text;
 };
 
 } // namespace Tarvel::Crypto

@@ -96,12 +96,10 @@ bool DecryptInPlace(PemBlock &block, Passphrase &passphrase) {
   if (!cipher.cipher) {
     return false;
   }
-  std::string secret = passphrase.Get();
+  const std::string &secret = passphrase.Get();
   long length = block.GetLength();
   const LibraryContextScope context;
-  const int decrypted = PEM_do_header(&cipher, block.GetData(), &length, GivePassphrase, &secret);
-  SecureWipe(secret);
-  if (decrypted != 1) {
+  if (PEM_do_header(&cipher, block.GetData(), &length, GivePassphrase, const_cast<std::string *>(&secret)) != 1) {
     throw WrongPassphraseException(errors.Describe(WRONG_PASSPHRASE));
   }
   block.SetLength(length);
@@ -190,8 +188,8 @@ Ref<const PrivateKey> LoadPrivateKey(const std::string &pathOrUri, const Passphr
   if (IsKeyUri(pathOrUri)) {
     return WithPathInErrors(pathOrUri, [&] { return LoadPrivateKeyFromUri(pathOrUri, passphrase); });
   }
-  const KeyFileText file(pathOrUri);
-  return NamingPath(pathOrUri, [&] { return CreatePrivateKey(file.Get(), passphrase); });
+  const SecretText file = ReadKeyFile(pathOrUri);
+  return WithPathInErrors(pathOrUri, [&] { return CreatePrivateKey(file.Get(), passphrase); });
 }
 
 void RequireKeyMatchesCertificate(const PrivateKey &key, const Certificate &certificate) {
