@@ -12,6 +12,7 @@
 #include <cstdint>
 #include <string>
 #include <string_view>
+#include <tuple>
 #include <vector>
 
 namespace Tarvel::Xml {
@@ -42,11 +43,25 @@ private:
 
     std::string_view GetNamespace() const noexcept { return replaced.empty() ? written : replaced; }
   };
+  using OrderIterator = std::vector<std::size_t>::const_iterator;
+
+  /// Two attributes of one element, by index; ordered by the second, then by the first.
+  struct AttributePair {
+    std::size_t first;
+    std::size_t second;
+
+    bool operator<(const AttributePair &other) const noexcept {
+      return std::tie(second, first) < std::tie(other.second, other.first);
+    }
+  };
+
 
   void Declare(const AttributeEvent &declaration);
   void CheckDeclaration(const AttributeEvent &declaration, std::string_view prefix) const;
   void CheckNames(const std::vector<AttributeEvent> &attributes);
   void CheckFewNames(const std::vector<AttributeEvent> &attributes);
+  void SortByName(const std::vector<AttributeEvent> &attributes);
+  AttributePair FindPair(const std::vector<AttributeEvent> &attributes, OrderIterator begin, OrderIterator end);
   void CheckManyNames(const std::vector<AttributeEvent> &attributes);
   [[noreturn]] void RefusePair(const AttributeEvent &first, const AttributeEvent &second) const;
   std::size_t FindNamespace(std::string_view prefix);

@@ -68,6 +68,8 @@ inline Block FindDoubtfulBytes(Block block) noexcept {
   return found;
 }
 
+constexpr std::string_view INSTRUCTION_BEGIN = "<?";
+
 /// A name as written, and where its prefix ends.
 struct WrittenName {
   std::string_view text;
@@ -200,7 +202,11 @@ public:
   /// @throws XMLParseException when it has other colons or is too long.
   WrittenName ReadName(Refusal atEnd);
 
-  /// What comes next is not what must come, for that reason; or what comes next is the end, for the other.
+  /// Passes over `INSTRUCTION_BEGIN`, which comes next, and the target of the processing instruction. @return the target.
+  /// @throws XMLParseException when it is missing, too long, has a colon or is "xml" in any letter case.
+  std::string_view ReadTarget();
+
+  /// Refuses what comes next, for the reason `refusal`, or `atEnd` if the text ends here.
   [[noreturn]] void RefuseNext(Refusal refusal, Refusal atEnd, std::string_view found = {});
   [[noreturn]] void Refuse(Refusal refusal, const char *place, std::string_view found = {},
                            std::string_view alsoFound = {}) const;
