@@ -199,7 +199,7 @@ void RequireKeyMatchesCertificate(const PrivateKey &key, const Certificate &cert
   EVP_PKEY *const publicKey = AsImpl(certificate).GetNativeKey();
   if (!publicKey || EVP_PKEY_eq(publicKey, AsImpl(key).GetNative()) != 1) {
     errors.RequireMemory();
-    throw KeyMismatchException("The private key is not the one of the certificate " +
+    throw KeyMismatchException("The private key does not belong to the certificate " +
                                StringUtil::Shorten(certificate.GetSubject()));
   }
 }

@@ -304,7 +304,7 @@ void CanonicalWalk::WriteAttributes(const ElementNode &element) {
   for (const CanonicalAttribute &attribute : m_attributes) {
     if (previous && attribute.HasNameOf(*previous)) {
       if (attribute.height == 0) {
-        Refuse("the attribute \"" + StringUtil::Shorten(attribute.attribute->GetName()) + "\" stands twice", element);
+        Refuse("the attribute \"" + StringUtil::Shorten(attribute.attribute->GetName()) + "\" occurs twice", element);
       }
       continue; // a nearer one overrides it
     }

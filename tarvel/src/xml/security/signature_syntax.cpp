@@ -57,7 +57,7 @@ public:
     if (const ElementNode *element = TakeIf(localName)) {
       return *element;
     }
-    const std::string found = m_current ? Quote(m_current->GetName()) + " stands there" : "nothing follows";
+    const std::string found = m_current ? "found " + Quote(m_current->GetName()) : "nothing follows";
     Fail("Expected ds:" + std::string(localName) + " in " + Quote(m_parent.GetName()) + ", but " + found,
          m_current ? *m_current : m_parent);
   }
