@@ -38,11 +38,11 @@ CertificateHandle Decode(const std::vector<std::uint8_t> &der) {
   if (!blank) {
     throw OutOfMemoryException();
   }
-  CertificateHandle native(d2i_X509(&blank, &position, static_cast<long>(der.size()))); // frees it when it fails
+  CertificateHandle native(d2i_X509(&blank, &position, static_cast<long>(der.size()))); // frees `blank` on failure
   if (!native) {
     errors.Throw("Certificate does not decode");
   }
-  // Without a key, or without its size, it is of an algorithm that OpenSSL does not know; but it keeps silent about memory.
+  // No key, or a key without a size, means an algorithm that OpenSSL does not know, or a lack of memory.
   EVP_PKEY *const key = X509_get0_pubkey(native.get());
   if (!key || EVP_PKEY_get_bits(key) <= 0) {
     errors.RequireMemory();
@@ -54,11 +54,10 @@ CertificateHandle Decode(const std::vector<std::uint8_t> &der) {
   return native;
 }
 
-// OpenSSL reads BER too. Two encodings of one certificate would be two different certificates to whoever compares
-// bytes.
+// OpenSSL also reads BER. To code that compares bytes, two encodings of one certificate would be two certificates.
 void RequireCanonical(X509 *native, const std::vector<std::uint8_t> &der) {
   const OpenSslErrorScope errors;
-  i2d_re_X509_tbs(native, nullptr); // makes the next line encode anew, instead of giving the bytes that were read
+  i2d_re_X509_tbs(native, nullptr); // makes the next line encode again instead of returning the bytes that were read
   unsigned char *encoded = nullptr;
   const int length = i2d_X509(native, &encoded);
   const MemoryHandle owner(encoded);
@@ -110,7 +109,7 @@ KeyKind FindKeyKind(EVP_PKEY *key) {
   return EVP_PKEY_is_a(key, "EC") ? FindCurve(key) : KeyKind::OTHER;
 }
 
-// With an exponent of 1 everybody can sign, and an even one belongs to no private key (RFC 8017, section 3.1).
+// With an exponent of 1 anyone can sign, and no private key has an even one (RFC 8017, section 3.1).
 bool IsExponentSound(EVP_PKEY *key) {
   const OpenSslErrorScope errors;
   BIGNUM *read = nullptr;
@@ -137,7 +136,7 @@ BioHandle NewMemoryBio() {
 }
 
 std::string DescribeName(const X509_NAME *name) {
-  // RFC 2253 allows UTF-8 as it is; OpenSSL's flags would have every byte of it escaped.
+  // RFC 2253 allows UTF-8; OpenSSL's own flags for it would escape every byte beyond ASCII.
   constexpr unsigned long FLAGS = XN_FLAG_RFC2253 & ~static_cast<unsigned long>(ASN1_STRFLGS_ESC_MSB);
   const OpenSslGuard guard;
   guard.Require();

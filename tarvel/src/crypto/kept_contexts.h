@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// `KeptContexts`, contexts of OpenSSL that are ready for the next use.
+/// `KeptContexts`, a pool of OpenSSL contexts for reuse.
 
 #pragma once
 
@@ -12,8 +12,8 @@
 
 namespace Tarvel::Crypto {
 
-/// To make a context costs allocations, and atomic operations on counters that all threads share. A context is for one
-/// thread at a time: so a thread takes one, uses it and returns it, the one of its own lane if it is there.
+/// A pool of contexts: creating one costs allocations, and atomic operations on counters that all threads share. A context
+/// serves one thread at a time. A thread acquires one, that of its own shard if possible, uses it and returns it.
 /// `Handle` is one of the owning handles; there are `KINDS` kinds of contexts, numbered from 0. Lock-free; safe on any
 /// thread. The destructor frees nothing, so that a static object never calls OpenSSL after the end of `main`.
 template <typename Handle, std::size_t KINDS>
@@ -49,7 +49,7 @@ public:
     }
   }
 
-  /// Frees all that is kept. For the owner alone, when nobody else uses the object.
+  /// Frees all kept contexts. Only for the owner, while no other thread uses the object.
   void FreeAll() noexcept {
     for (Lane &lane : m_lanes) {
       for (Slot &slot : lane.slots) {

@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// Contexts that are set up to check or to make signatures, kept with the certificate or the private key that they use.
+/// `KeyContexts`, the contexts that a certificate or a private key keeps for checking or making signatures.
 
 #pragma once
 
@@ -13,9 +13,8 @@
 
 namespace Tarvel::Crypto {
 
-/// Contexts of one operation, checking or making signatures, and of one key. To set one up costs a fifth of an RSA check,
-/// and a context is for one thread at a time: so a thread takes one, uses it and returns it, the one of its own lane if it
-/// is there. Lock-free; safe on any thread.
+/// Contexts for one key and one operation, which is checking signatures or making them. Setting up a context costs a fifth of
+/// an RSA check, so contexts are kept for reuse. Lock-free; safe on any thread.
 class KeyContexts {
 public:
   KeyContexts() = default;

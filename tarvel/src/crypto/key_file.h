@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// Reading a file of keys or certificates, and saying in each error which file it was.
+/// Reading files of keys or certificates, and adding their paths to errors.
 
 #pragma once
 

@@ -20,7 +20,7 @@ namespace {
 constexpr std::string_view SCHEME_LETTERS = "ABCDEFGHIJKLMNOPQRSTUVWXYZabcdefghijklmnopqrstuvwxyz";
 constexpr std::string_view SCHEME_CHARACTERS = "ABCDEFGHIJKLMNOPQRSTUVWXYZabcdefghijklmnopqrstuvwxyz0123456789+-.";
 
-// What a store's loader asks us, and what came of it: no exception may cross OpenSSL's frames.
+// The state of the callback for a passphrase. It stores its exception, which must not pass through OpenSSL's frames.
 struct PassphraseQuestion {
   Passphrase passphrase;
   bool asked = false;
@@ -66,7 +66,7 @@ KeyHandle LoadNextKey(OSSL_STORE_CTX *store, const OpenSslErrorScope &errors, co
       ThrowStoreFailure(errors, question);
     }
     if (!info && OSSL_STORE_error(store)) {
-      return nullptr; // without an error's code: what is there is something else than a key
+      return nullptr; // an error without a code: the content is not a key
     }
     if (info && OSSL_STORE_INFO_get_type(info.get()) == OSSL_STORE_INFO_PKEY) {
       return KeyHandle(OSSL_STORE_INFO_get1_PKEY(info.get()));

@@ -25,17 +25,17 @@ namespace Tarvel::Crypto {
 
 namespace {
 
-/// A use is computation alone, so this is far more than one takes.
+/// A use only computes, and takes far less than this.
 constexpr std::chrono::milliseconds MAX_WAIT{500};
 constexpr std::chrono::microseconds WAIT_STEP{100};
 
-/// The uses that are going on, counted by the lanes of the threads: one count for all would be what they queue up for.
+/// The uses under way, counted per shard: a single counter would be a point of contention.
 struct alignas(System::LANE_ALIGNMENT) Lane {
   std::atomic<std::uint32_t> uses{0};
 };
 
-// Constant-initialised and never destroyed. Both are sequentially consistent: either the use that begins sees the end, or
-// whoever ends sees the use.
+// Constant-initialised and never destroyed. Both are sequentially consistent: either a use that begins sees `ended`, or the
+// clean-up sees the use.
 std::array<Lane, 16> lanes;
 std::atomic<bool> ended{false};
 
@@ -45,7 +45,7 @@ struct Abandoned {
 };
 std::atomic<Abandoned *> abandoned{nullptr};
 
-/// Where the use is counted that has begun; null when none may begin any more.
+/// Begins a use and returns the counter that counts it; null once the clean-up has begun.
 std::atomic<std::uint32_t> *TryBegin() noexcept {
   std::atomic<std::uint32_t> &uses = lanes[System::GetThreadLane(lanes.size())].uses;
   uses.fetch_add(1);
@@ -101,11 +101,11 @@ void OpenSslGuard::Abandon(void *object) noexcept {
 }
 
 void OpenSslGuard::Prepare() {
-  // Around the once, or a thread within it could wait for a fork that waits for a thread that waits for the once.
+  // Before `call_once`: inside it, a thread could wait for a fork that waits for a thread that waits for `call_once`.
   const System::Computation computing;
   static std::once_flag registered;
   std::call_once(registered, [] {
-    // In this order, for it is OpenSSL's own initialisation that arranges for the clean-up.
+    // In this order, because OpenSSL's initialisation registers its clean-up.
     InitialiseOpenSsl();
     const OpenSslErrorScope errors;
     if (OPENSSL_atexit(OnCleanUp) != 1) {

@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// Using OpenSSL on threads that run until the process ends, and so while OpenSSL takes itself down.
+/// `OpenSslGuard`, for uses of OpenSSL on threads that may still run when OpenSSL cleans itself up.
 
 #pragma once
 
@@ -11,9 +11,9 @@
 
 namespace Tarvel::Crypto {
 
-/// Around short uses of OpenSSL on a thread that nobody joins. OpenSSL's clean-up, which runs when the process ends or the
-/// host asks for it, waits a moment for the uses that are going on; later ones are told to keep away.
-/// Nobody forks during a use.
+/// Guards a short use of OpenSSL on a thread that may still run when the process ends. OpenSSL's clean-up, which runs at the
+/// end of the process or when the host calls it, waits briefly for the uses under way; later uses are refused. A fork waits
+/// for the uses under way, too.
 class OpenSslGuard {
 public:
   OpenSslGuard() noexcept;
@@ -24,22 +24,21 @@ public:
   /// False once the clean-up has begun: then OpenSSL must not be called any more, not even to free what it made.
   explicit operator bool() const noexcept { return m_count != nullptr; }
 
-  /// @throws InvalidStateException, with `ENDED` for its text, once the clean-up has begun.
+  /// @throws InvalidStateException with the text `ENDED` once the clean-up has begun.
   void Require() const;
 
   static constexpr const char *ENDED = "OpenSSL has cleaned itself up: the process is about to end";
 
-  /// While the code of somebody else runs in the middle of a use, which may take its time, or fork. Afterwards the use goes on;
+  /// `Suspend` interrupts the use while the host's code runs, which may block or fork. `Resume` continues it, and returns
   /// false once the clean-up has begun.
   void Suspend() noexcept;
   bool Resume() noexcept;
 
-  /// Initialises OpenSSL and has it report its clean-up. Called before the first use; any number of times.
+  /// Initialises OpenSSL and registers for its clean-up. Call this before the first use; any number of times.
   /// @throws CryptoException, OutOfMemoryException, and InvalidStateException when OpenSSL has cleaned itself up.
   static void Prepare();
 
-  /// Takes over an object of OpenSSL's that can no longer be freed. It stays reachable, so that whoever looks for leaks
-  /// sees it for what it is.
+  /// Takes over an OpenSSL object that can no longer be freed. It stays reachable, so that leak checkers do not report it.
   static void Abandon(void *object) noexcept;
 
 private:

@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// Owning handles for the objects of OpenSSL: each is freed when its handle goes, unless OpenSSL has cleaned itself up.
+/// Owning handles for OpenSSL's objects. A handle frees its object, unless OpenSSL has cleaned itself up.
 
 #pragma once
 
@@ -18,7 +18,7 @@
 
 namespace Tarvel::Crypto {
 
-/// Frees a handle by the function that OpenSSL has for it.
+/// Frees an object with the OpenSSL function for its type.
 template <auto FREE>
 struct OpenSslDeleter {
   template <typename T>

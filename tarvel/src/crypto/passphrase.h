@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// A passphrase that is asked for when it is first needed, and wiped.
+/// `Passphrase`, which asks the host for a passphrase when it is first needed, and wipes it.
 
 #pragma once
 
@@ -16,14 +16,14 @@ namespace Tarvel::Crypto {
 /// Asks its callback at most once, on the thread that first needs the passphrase.
 class Passphrase {
 public:
-  /// `ask`, and `guard` in the middle of which it is called, must live as long as this.
+  /// Both must outlive this object. `guard` is suspended while `ask` runs.
   Passphrase(const PassphraseCallback &ask, OpenSslGuard &guard) : m_ask(ask), m_guard(guard) {}
   Passphrase(const Passphrase &) = delete;
   Passphrase &operator=(const Passphrase &) = delete;
 
-  /// The passphrase, wiped with this object.
+  /// The passphrase, valid as long as this object.
   /// @throws WrongPassphraseException when there is no callback; whatever the callback throws; InvalidStateException when
-  ///         OpenSSL has cleaned itself up meanwhile.
+  ///         OpenSSL has cleaned itself up in the meantime.
   const std::string &Get();
 
 private:

@@ -31,7 +31,7 @@ const unsigned char *BytesOf(std::string_view der) {
   return reinterpret_cast<const unsigned char *>(der.data());
 }
 
-// OpenSSL asks for a passphrase by this; `secret` is the text. It is longer than `size` only when it is wrong anyway.
+// OpenSSL's callback for a passphrase; `secret` is a `const std::string`. A text longer than `size` is wrong in any case.
 int GivePassphrase(char *buffer, int size, int, void *secret) {
   const std::string &text = *static_cast<const std::string *>(secret);
   if (text.size() > static_cast<std::size_t>(size)) {
@@ -41,8 +41,8 @@ int GivePassphrase(char *buffer, int size, int, void *secret) {
   return static_cast<int>(text.size());
 }
 
-// PKCS#8 or one of the traditional forms, not encrypted. Null when it does not decode, or bytes follow it; why not, the
-// caller's scope says.
+// PKCS#8 or one of the traditional forms, not encrypted. Null if it does not decode, or bytes follow it; the caller's
+// error scope has the reason.
 KeyHandle DecodePlain(std::string_view der) {
   const unsigned char *position = BytesOf(der);
   KeyHandle key(d2i_AutoPrivateKey_ex(nullptr, &position, static_cast<long>(der.size()), GetLibraryContext(), nullptr));
@@ -59,7 +59,7 @@ EncryptedKeyHandle DecodeEncrypted(std::string_view der) {
   return encrypted && position == BytesOf(der) + der.size() ? std::move(encrypted) : nullptr;
 }
 
-// A wrong passphrase shows by padding that does not come out, or, one time in 256, by a key that does not decode.
+// A wrong passphrase leads to wrong padding or, one time in 256, to a key that does not decode.
 KeyHandle Decrypt(const X509_SIG *encrypted, Passphrase &passphrase) {
   const std::string &secret = passphrase.Get();
   const OpenSslErrorScope errors;
@@ -86,7 +86,7 @@ KeyHandle DecodeEncryptedOrThrow(std::string_view der, Passphrase &passphrase) {
   return Decrypt(encrypted.get(), passphrase);
 }
 
-// The traditional form names its cipher in headers (RFC 1421), and is decrypted in place.
+// The traditional form has its cipher in headers (RFC 1421), and is decrypted in place.
 bool DecryptInPlace(PemBlock &block, Passphrase &passphrase) {
   const OpenSslErrorScope errors;
   EVP_CIPHER_INFO cipher{};

@@ -15,7 +15,7 @@ PrivateKeyImpl::PrivateKeyImpl(KeyHandle native) : m_native(std::move(native)) {
   guard.Require();
   const OpenSslErrorScope errors;
   m_bits = static_cast<unsigned>(EVP_PKEY_get_bits(m_native.get()));
-  if (m_bits == 0) { // which OpenSSL looks up when it reads a key, and keeps silent about memory
+  if (m_bits == 0) { // OpenSSL sets the size when it reads a key; without memory it silently does not
     throw OutOfMemoryException();
   }
   for (const char *const algorithm : {"RSA", "EC"}) {

@@ -38,7 +38,7 @@ std::size_t BytesOf(unsigned bits) {
   return (bits + BITS_PER_BYTE - 1) / BITS_PER_BYTE;
 }
 
-// What follows EVP_PKEY_sign_init or EVP_PKEY_verify_init.
+// The settings that follow EVP_PKEY_sign_init or EVP_PKEY_verify_init.
 bool SetScheme(EVP_PKEY_CTX *context, SignatureScheme scheme, DigestAlgorithm algorithm) {
   const EVP_MD *const method = GetDigestMethod(algorithm);
   if (EVP_PKEY_CTX_set_signature_md(context, method) <= 0) {
@@ -57,7 +57,7 @@ bool SetScheme(EVP_PKEY_CTX *context, SignatureScheme scheme, DigestAlgorithm al
   return true;
 }
 
-// Each context has a key of its own, since OpenSSL locks a key for each use of it, and threads would wait for each other.
+// Each context has its own copy of the key: OpenSSL locks a key during each use, and threads would wait for each other.
 KeyContextHandle NewVerifyContext(EVP_PKEY *sharedKey, SignatureScheme scheme, DigestAlgorithm algorithm) {
   const OpenSslErrorScope errors;
   const KeyHandle key(EVP_PKEY_dup(sharedKey));
@@ -84,7 +84,7 @@ BignumHandle ReadNumber(const std::uint8_t *bytes, std::size_t length) {
   return BignumHandle(BN_bin2bn(bytes, static_cast<int>(length), nullptr));
 }
 
-// OpenSSL takes ECDSA values as a DER sequence of r and s, XML Signature as their octets side by side.
+// OpenSSL expects an ECDSA value as a DER sequence of r and s; XML Signature has their octets one after the other.
 std::vector<std::uint8_t> EncodeEcdsaValue(const std::uint8_t *value, std::size_t numberBytes) {
   const OpenSslErrorScope errors;
   BignumHandle r = ReadNumber(value, numberBytes);
@@ -125,7 +125,7 @@ bool Verify(EVP_PKEY_CTX *context, DigestAlgorithm algorithm, const std::uint8_t
     errors.Throw("Failed to check a signature");
   }
   if (answer == 0) {
-    errors.RequireMemory(); // OpenSSL answers no then as well
+    errors.RequireMemory(); // without memory, OpenSSL also answers "no"
   }
   return answer == 1;
 }

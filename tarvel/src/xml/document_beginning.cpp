@@ -16,12 +16,12 @@ namespace {
 constexpr std::string_view DECLARATION_BEGIN = "<?xml";
 constexpr std::size_t FIRST_BYTES = 4; // enough to distinguish the encodings of Unicode (XML 1.0, appendix F)
 
-/// Reads the parts of an XML declaration (XML 1.0, section 2.8), which come in one order.
+/// Reads the parts of an XML declaration (XML 1.0, section 2.8), which have a fixed order.
 class DeclarationReader {
 public:
   explicit DeclarationReader(SourceCursor &cursor) : m_cursor(cursor) { m_cursor.Advance(DECLARATION_BEGIN.size()); }
 
-  /// The value of the part `name`, or nothing when another part or the end comes next.
+  /// The value of the part `name`, or nullopt if another part or the end comes next.
   std::optional<std::string_view> Read(std::string_view name) {
     m_isAfterSpace = m_cursor.SkipSpace() || m_isAfterSpace;
     if (!m_isAfterSpace || !m_cursor.Skip(name)) {

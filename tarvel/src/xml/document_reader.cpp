@@ -112,7 +112,7 @@ void DocumentReader::ReadOutside() {
   ReadMarkup();
 }
 
-/// Reads what begins with the "<" that comes next.
+/// Reads the markup that begins with the next character, "<".
 void DocumentReader::ReadMarkup() {
   if (m_cursor.IsAt("</")) {
     ReadEndTag();
@@ -238,7 +238,7 @@ void DocumentReader::ReadEndTag() {
     m_cursor.Refuse(Refusal::END_TAG_WITHOUT_START_TAG, tag);
   }
   m_cursor.Advance(2);
-  if (m_cursor.Skip(m_open.back().name, '>')) { // as nearly all are
+  if (m_cursor.Skip(m_open.back().name, '>')) { // nearly always
     EndElement();
     return;
   }
@@ -288,13 +288,13 @@ void DocumentReader::ReadText() {
     }
   }
   const std::string_view text = m_gatherer.End(m_cursor.GetPlace());
-  if (!text.empty()) { // it is when all of it is an empty CDATA section
+  if (!text.empty()) { // an empty CDATA section alone makes no text
     Count(begin);
     m_handler.Characters(text);
   }
 }
 
-/// Reads a CDATA section as a part of the text around it.
+/// Reads a CDATA section as part of the text around it.
 void DocumentReader::ReadCData() {
   const char *const begin = m_cursor.GetPlace();
   m_cursor.Advance(CDATA_BEGIN.size());
@@ -303,8 +303,8 @@ void DocumentReader::ReadCData() {
   m_gatherer.Replace(end, m_cursor.GetPlace(), "");
 }
 
-/// Passes over characters that mean no markup, line ends replaced, and over the `delimiter` that ends them.
-/// @param atEnd the reason when the document ends before. @return where the delimiter begins.
+/// Passes over characters that are not markup, replacing line ends, and over the `delimiter` that ends them.
+/// @param atEnd the refusal if the document ends before it. @return where the delimiter begins.
 const char *DocumentReader::SkipUpTo(std::string_view delimiter, Refusal atEnd) {
   for (;;) {
     m_cursor.SkipPlain<PLAIN_IN_MARKUP>();

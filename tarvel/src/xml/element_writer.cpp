@@ -89,10 +89,10 @@ private:
     }
   }
 
-  /// The texts of a tree are UTF-8: `character` is one.
+  /// `character` is valid: the texts of a tree are UTF-8.
   void WriteNumber(std::uint32_t character) {
     constexpr std::string_view DIGITS = "0123456789ABCDEF";
-    std::array<char, 8> digits{}; // of 32 bits
+    std::array<char, 8> digits{}; // enough for 32 bits
     std::size_t begin = digits.size();
     for (std::uint32_t rest = character; rest > 0; rest /= 16) {
       digits[--begin] = DIGITS[rest % 16];

@@ -15,7 +15,7 @@ namespace Tarvel::Xml {
 
 namespace {
 
-// Up to this number each attribute is compared with each other; more are sorted first.
+// Up to this number, every two attributes are compared; more are sorted first.
 constexpr std::size_t FEW_ATTRIBUTES = 8;
 
 } // namespace
@@ -81,7 +81,7 @@ void NamespaceScope::CheckNames(const std::vector<AttributeEvent> &attributes) {
   }
 }
 
-// Of all pairs that must not be, the one is reported whose second attribute comes first.
+// Of all forbidden pairs, the one whose second attribute comes first is reported.
 void NamespaceScope::CheckFewNames(const std::vector<AttributeEvent> &attributes) {
   constexpr std::size_t NOT_LOOKED_UP = UNKNOWN - 1;
   std::array<std::size_t, FEW_ATTRIBUTES> namespaces; // each is looked up at most once: there may be many declarations
@@ -105,7 +105,7 @@ void NamespaceScope::CheckFewNames(const std::vector<AttributeEvent> &attributes
   }
 }
 
-/// Two attributes of one element have one name.
+/// Refuses two attributes that have the same name.
 void NamespaceScope::RefusePair(const AttributeEvent &first, const AttributeEvent &second) const {
   if (first.name == second.name) {
     m_cursor.Refuse(Refusal::ATTRIBUTE_TWICE, second.name.data(), second.name);
@@ -114,7 +114,7 @@ void NamespaceScope::RefusePair(const AttributeEvent &first, const AttributeEven
 }
 
 // Attributes of one local name are adjacent once they are sorted, and among them those of one namespace after a second
-// sorting. Of all pairs that must not be, the one is reported whose second attribute comes first.
+// sorting. Of all forbidden pairs, the one whose second attribute comes first is reported.
 void NamespaceScope::CheckManyNames(const std::vector<AttributeEvent> &attributes) {
   SortByName(attributes);
   AttributePair firstPair{UNKNOWN, UNKNOWN};
@@ -183,7 +183,7 @@ std::size_t NamespaceScope::FindNamespace(std::string_view prefix) {
   return UNKNOWN;
 }
 
-// Names may be long and asked for often: they are compared once for each declaration.
+// Namespace names may be long and are needed often, so they are compared only once for each declaration.
 std::size_t NamespaceScope::FindRepresentative(std::size_t declaration) {
   std::size_t &representative = m_declarations[declaration].representative;
   if (representative == UNKNOWN) {

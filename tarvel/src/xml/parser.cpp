@@ -14,8 +14,7 @@ namespace Tarvel::Xml {
 
 namespace {
 
-/// The text of a document, kept where it is for as long as views into it are used. It may hold a bearer token, and is
-/// overwritten.
+/// The text of a document, which may contain a bearer token. It does not move while views of it are in use.
 class SourceText final : public Object {
 public:
   explicit SourceText(std::string &&text) noexcept : m_text(std::move(text)) {}

@@ -113,23 +113,23 @@ void UseAfterCleanUp() {
 
 TEST(Passphrase, IsAskedForInAPauseOfTheUse) {
   OpenSslGuard::Prepare();
-  OpenSslGuard use;
-  const PassphraseCallback ask = [&use] {
-    EXPECT_FALSE(use); // so that nobody waits for who types
+  OpenSslGuard guard;
+  const PassphraseCallback ask = [&guard] {
+    EXPECT_FALSE(guard); // so that nobody waits for who types
     return std::string("x");
   };
-  Passphrase passphrase(ask, use);
+  Passphrase passphrase(ask, guard);
   EXPECT_EQ(passphrase.Get(), "x");
-  EXPECT_TRUE(use);
+  EXPECT_TRUE(guard);
 }
 
 TEST(Passphrase, IsFollowedByTheUseAlsoWhenTheHostThrows) {
   OpenSslGuard::Prepare();
-  OpenSslGuard use;
+  OpenSslGuard guard;
   const PassphraseCallback ask = []() -> std::string { throw InvalidArgumentException("no"); };
-  Passphrase passphrase(ask, use);
+  Passphrase passphrase(ask, guard);
   EXPECT_THROW(passphrase.Get(), InvalidArgumentException);
-  EXPECT_TRUE(use);
+  EXPECT_TRUE(guard);
 }
 
 void CleanUpWhileThePassphraseIsAskedFor() {
