@@ -2,7 +2,7 @@
 
 #include "ssl/session_cache.h"
 
-#include "crypto/openssl_use.h"
+#include "crypto/openssl_guard.h"
 
 #include <ctime>
 #include <iterator>
@@ -69,7 +69,7 @@ SessionHandle SessionCache::Take(const std::string &key) {
 void SessionCache::Abandon() noexcept {
   const std::lock_guard<ForkSafeMutex> lock(m_mutex);
   for (Entry &entry : m_entries) {
-    Crypto::OpenSslUse::Abandon(entry.session.release());
+    Crypto::OpenSslGuard::Abandon(entry.session.release());
   }
 }
 

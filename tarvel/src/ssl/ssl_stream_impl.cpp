@@ -3,8 +3,7 @@
 #include "ssl/ssl_stream_impl.h"
 
 #include "crypto/openssl_errors.h"
-#include "crypto/openssl_use.h"
-#include "service/uncaught_exception.h"
+#include "crypto/openssl_guard.h"
 #include "system/io_engine.h"
 
 #include <tarvel/core/exception.h>
@@ -129,11 +128,11 @@ SSLStreamImpl::SSLStreamImpl(const Ref<SSLContextImpl> &context, const Ref<Syste
 
 SSLStreamImpl::~SSLStreamImpl() {
   m_endNotice.Withdraw();
-  const Crypto::OpenSslUse use;
+  const Crypto::OpenSslGuard use;
   if (!use) {
-    Crypto::OpenSslUse::Abandon(m_connection.release());
+    Crypto::OpenSslGuard::Abandon(m_connection.release());
     for (SessionHandle &session : m_newSessions) {
-      Crypto::OpenSslUse::Abandon(session.release());
+      Crypto::OpenSslGuard::Abandon(session.release());
     }
     return;
   }
@@ -202,7 +201,7 @@ void SSLStreamImpl::Close() noexcept {
     return;
   }
   {
-    const Crypto::OpenSslUse use;
+    const Crypto::OpenSslGuard use;
     const std::lock_guard<ForkSafeMutex> lock(m_mutex);
     if (!use) {
       MarkEnded();
@@ -255,7 +254,7 @@ template <typename Step>
 void SSLStreamImpl::Advance(const Step &step) noexcept {
   Completions done;
   {
-    const Crypto::OpenSslUse use;
+    const Crypto::OpenSslGuard use;
     const std::lock_guard<ForkSafeMutex> lock(m_mutex);
     if (!use) {
       MarkEnded();

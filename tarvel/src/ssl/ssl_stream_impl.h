@@ -121,7 +121,7 @@ private:
   const Ref<System::Stream> m_lower;
   const std::string m_endpoint;
   const Failure m_noMemory = std::make_shared<OutOfMemoryException>();
-  const Failure m_processEnds = std::make_shared<InvalidStateException>(Crypto::OpenSslUse::ENDED);
+  const Failure m_processEnds = std::make_shared<InvalidStateException>(Crypto::OpenSslGuard::ENDED);
   std::atomic<bool> m_wasResumed{false};
 
   ForkSafeMutex m_mutex; // guards all that follows; never held while a handler runs

@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 
-#include "crypto/openssl_use.h"
+#include "crypto/openssl_guard.h"
 
 #include "core/thread_shard.h"
 #include "crypto/library_context.h"
@@ -25,18 +25,18 @@ namespace Tarvel::Crypto {
 
 namespace {
 
-/// A use is computation alone, so this is far more than one takes.
+/// A use only computes, and takes far less than this.
 constexpr std::chrono::milliseconds MAX_WAIT{500};
 constexpr std::chrono::microseconds WAIT_STEP{100};
 
-/// The uses that are going on, counted by the lanes of the threads: one count for all would be what they queue up for.
-struct alignas(SHARD_ALIGNMENT) Lane {
+/// The uses under way, counted per shard: a single counter would be a point of contention.
+struct alignas(SHARD_ALIGNMENT) Shard {
   std::atomic<std::uint32_t> uses{0};
 };
 
-// Constant-initialised and never destroyed. Both are sequentially consistent: either the use that begins sees the end, or
-// whoever ends sees the use.
-std::array<Lane, 16> lanes;
+// Constant-initialised and never destroyed. Both are sequentially consistent: either a use that begins sees `ended`, or the
+// clean-up sees the use.
+std::array<Shard, 16> shards;
 std::atomic<bool> ended{false};
 
 struct Abandoned {
@@ -45,9 +45,9 @@ struct Abandoned {
 };
 std::atomic<Abandoned *> abandoned{nullptr};
 
-/// Where the use is counted that has begun; null when none may begin any more.
+/// Begins a use and returns the counter that counts it; null once the clean-up has begun.
 std::atomic<std::uint32_t> *TryBegin() noexcept {
-  std::atomic<std::uint32_t> &uses = lanes[GetThreadShard(lanes.size())].uses;
+  std::atomic<std::uint32_t> &uses = shards[GetThreadShard(shards.size())].uses;
   uses.fetch_add(1);
   if (ended.load()) {
     uses.fetch_sub(1);
@@ -57,7 +57,7 @@ std::atomic<std::uint32_t> *TryBegin() noexcept {
 }
 
 bool IsAnyGoingOn() noexcept {
-  return std::any_of(lanes.begin(), lanes.end(), [](const Lane &lane) { return lane.uses.load() != 0; });
+  return std::any_of(shards.begin(), shards.end(), [](const Shard &shard) { return shard.uses.load() != 0; });
 }
 
 void OnCleanUp() noexcept {
@@ -70,42 +70,42 @@ void OnCleanUp() noexcept {
 
 } // namespace
 
-OpenSslUse::OpenSslUse() noexcept : m_count(TryBegin()) {}
+OpenSslGuard::OpenSslGuard() noexcept : m_count(TryBegin()) {}
 
-OpenSslUse::~OpenSslUse() {
+OpenSslGuard::~OpenSslGuard() {
   Suspend();
 }
 
-void OpenSslUse::Suspend() noexcept {
+void OpenSslGuard::Suspend() noexcept {
   if (m_count) {
     std::exchange(m_count, nullptr)->fetch_sub(1);
   }
 }
 
-bool OpenSslUse::Resume() noexcept {
+bool OpenSslGuard::Resume() noexcept {
   m_count = TryBegin();
   return m_count != nullptr;
 }
 
-void OpenSslUse::Require() const {
+void OpenSslGuard::Require() const {
   if (!m_count) {
     throw InvalidStateException(ENDED);
   }
 }
 
-void OpenSslUse::Abandon(void *object) noexcept {
+void OpenSslGuard::Abandon(void *object) noexcept {
   if (auto *const entry = new (std::nothrow) Abandoned{object, abandoned.load()}) {
     while (!abandoned.compare_exchange_weak(entry->next, entry)) {
     }
   }
 }
 
-void OpenSslUse::Prepare() {
-  // Around the once, or a thread within it could wait for a fork that waits for a thread that waits for the once.
+void OpenSslGuard::Prepare() {
+  // Before `call_once`: inside it, a thread could wait for a fork that waits for a thread that waits for `call_once`.
   const Computation computing;
   static std::once_flag registered;
   std::call_once(registered, [] {
-    // In this order, for it is OpenSSL's own initialisation that arranges for the clean-up.
+    // In this order, because OpenSSL's initialisation registers its clean-up.
     InitialiseOpenSsl();
     const OpenSslErrorScope errors;
     if (OPENSSL_atexit(OnCleanUp) != 1) {

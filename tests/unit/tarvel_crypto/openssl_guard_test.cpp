@@ -1,7 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 // Keys and certificates on threads that nobody joins, while the process ends.
 
-#include "crypto/openssl_use.h"
+#include "crypto/openssl_guard.h"
 
 #include "crypto/passphrase.h"
 #include "crypto/public_key.h"
@@ -74,7 +74,7 @@ void EndWhileBusy() {
   std::exit(0);
 }
 
-TEST(OpenSslUseDeathTest, TheProcessMayEndWhileSignaturesAreMadeAndChecked) {
+TEST(OpenSslGuardDeathTest, TheProcessMayEndWhileSignaturesAreMadeAndChecked) {
   testing::FLAGS_gtest_death_test_style = "threadsafe";
   for (int i = 0; i < 5; ++i) {
     ASSERT_EXIT(EndWhileBusy(), testing::ExitedWithCode(0), "") << i;
@@ -112,24 +112,24 @@ void UseAfterCleanUp() {
 }
 
 TEST(Passphrase, IsAskedForInAPauseOfTheUse) {
-  OpenSslUse::Prepare();
-  OpenSslUse use;
-  const PassphraseCallback ask = [&use] {
-    EXPECT_FALSE(use); // so that nobody waits for who types
+  OpenSslGuard::Prepare();
+  OpenSslGuard guard;
+  const PassphraseCallback ask = [&guard] {
+    EXPECT_FALSE(guard); // so that nobody waits for who types
     return std::string("x");
   };
-  Passphrase passphrase(ask, use);
+  Passphrase passphrase(ask, guard);
   EXPECT_EQ(passphrase.Get(), "x");
-  EXPECT_TRUE(use);
+  EXPECT_TRUE(guard);
 }
 
 TEST(Passphrase, IsFollowedByTheUseAlsoWhenTheHostThrows) {
-  OpenSslUse::Prepare();
-  OpenSslUse use;
+  OpenSslGuard::Prepare();
+  OpenSslGuard guard;
   const PassphraseCallback ask = []() -> std::string { throw InvalidArgumentException("no"); };
-  Passphrase passphrase(ask, use);
+  Passphrase passphrase(ask, guard);
   EXPECT_THROW(passphrase.Get(), InvalidArgumentException);
-  EXPECT_TRUE(use);
+  EXPECT_TRUE(guard);
 }
 
 void CleanUpWhileThePassphraseIsAskedFor() {
@@ -142,13 +142,13 @@ void CleanUpWhileThePassphraseIsAskedFor() {
   std::_Exit(0);
 }
 
-TEST(OpenSslUseDeathTest, IsRefusedWhenOpenSslCleanedItselfUpWhileThePassphraseWasAskedFor) {
+TEST(OpenSslGuardDeathTest, IsRefusedWhenOpenSslCleanedItselfUpWhileThePassphraseWasAskedFor) {
   testing::FLAGS_gtest_death_test_style = "threadsafe";
   EXPECT_EXIT(CleanUpWhileThePassphraseIsAskedFor(), testing::ExitedWithCode(0),
               "^key: OpenSSL has cleaned itself up: the process is about to end\n$");
 }
 
-TEST(OpenSslUseDeathTest, IsRefusedOnceOpenSslHasCleanedItselfUp) {
+TEST(OpenSslGuardDeathTest, IsRefusedOnceOpenSslHasCleanedItselfUp) {
   testing::FLAGS_gtest_death_test_style = "threadsafe";
   const char *const reason = ": OpenSSL has cleaned itself up: the process is about to end\n";
   std::string expected = "^";
