@@ -19,7 +19,8 @@
 #define SSOCLIENT_VERSION_NUMBER                                                                                       \
   SSOCLIENT_MAKE_VERSION(SSOCLIENT_VERSION_MAJOR, SSOCLIENT_VERSION_MINOR, SSOCLIENT_VERSION_PATCH)
 
-/// @cond Two steps, because an argument of `#` is not replaced by its value.
+/// @cond INTERNAL
+// Two steps, because an argument of `#` is not replaced by its value.
 #define SSOCLIENT_QUOTE_VERSION(major, minor, patch) #major "." #minor "." #patch
 #define SSOCLIENT_EXPAND_AND_QUOTE_VERSION(major, minor, patch) SSOCLIENT_QUOTE_VERSION(major, minor, patch)
 /// @endcond
