@@ -7,7 +7,7 @@
 #include "support/facts_of.h"
 #include "token/assertion_parser.h"
 #include "token/token_facts.h"
-#include "xml/parse_xml.h"
+#include "xml/xml_text.h"
 
 #include <ssoclient/create_saml_token.h>
 #include <ssoclient/exceptions.h>

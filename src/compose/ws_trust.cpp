@@ -23,11 +23,6 @@ std::string BooleanText(bool value) {
   return value ? "true" : "false";
 }
 
-/// A URI below the WS-Trust namespace; `path` begins with a slash.
-std::string WstUri(const char *path) {
-  return std::string(Namespaces::WST) + path;
-}
-
 XMLCompositePtr RequestSecurityTokenBuilder(const std::string &tokenType, const std::string &requestType) {
   auto request = std::make_shared<XMLCompositeBuilder>(
       ElementBuilder("wst", "RequestSecurityToken", {{"xmlns:wst", std::string(Namespaces::WST)}}));
@@ -36,7 +31,7 @@ XMLCompositePtr RequestSecurityTokenBuilder(const std::string &tokenType, const 
   return request;
 }
 
-/// `name` with the token's own assertion element as its only child.
+/// The element `name`, whose only child is the assertion element of the token.
 XMLBuilderPtr TokenTargetBuilder(const std::string &name, const SamlToken &token) {
   auto target = std::make_shared<XMLCompositeBuilder>(ElementBuilder("wst", name));
   target->Add(InsertSamlTokenBuilder(token));
@@ -56,8 +51,9 @@ std::int64_t AddSeconds(std::int64_t utcMicroseconds, std::int64_t seconds) {
 } // namespace
 
 XMLCompositePtr CommonAcquireSecurityTokenBuilder(SamlToken::ConfirmationType confirmation, const TokenSpec &spec) {
-  const std::string keyType = WstUri(confirmation == SamlToken::BEARER ? "/Bearer" : "/PublicKey");
-  XMLCompositePtr request = RequestSecurityTokenBuilder(std::string(Namespaces::SAML), WstUri("/Issue"));
+  const std::string keyType =
+      confirmation == SamlToken::BEARER ? WstUris::KEY_TYPE_BEARER : WstUris::KEY_TYPE_PUBLIC_KEY;
+  XMLCompositePtr request = RequestSecurityTokenBuilder(std::string(Namespaces::SAML), WstUris::ISSUE);
   request->Add(TextElementBuilder("wst", "KeyType", keyType))
       .Add(WssuLifetimeBuilder(spec.tokenLifetimeSec))
       .Add(WstRenewingBuilder(spec.renewable))
@@ -87,13 +83,13 @@ XMLCompositePtr ExchangeSecurityTokenBuilder(SamlToken::ConfirmationType confirm
 }
 
 XMLBuilderPtr RenewSecurityTokenBuilder(const SamlToken &token, std::int64_t lifetimeSec) {
-  XMLCompositePtr request = RequestSecurityTokenBuilder(std::string(Namespaces::SAML), WstUri("/Renew"));
+  XMLCompositePtr request = RequestSecurityTokenBuilder(std::string(Namespaces::SAML), WstUris::RENEW);
   request->Add(WssuLifetimeBuilder(lifetimeSec)).Add(TokenTargetBuilder("RenewTarget", token));
   return request;
 }
 
 XMLBuilderPtr ValidateSecurityTokenBuilder(const SamlToken &token) {
-  XMLCompositePtr request = RequestSecurityTokenBuilder(WstUri("/RSTR/Status"), WstUri("/Validate"));
+  XMLCompositePtr request = RequestSecurityTokenBuilder(WstUris::TOKEN_TYPE_STATUS, WstUris::VALIDATE);
   request->Add(TokenTargetBuilder("ValidateTarget", token));
   return request;
 }

@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 
-#include "xml/parse_xml.h"
+#include "xml/xml_text.h"
 
 #include <tarvel/xml/parser.h>
 
