@@ -14,7 +14,7 @@ std::shared_ptr<const Exception> MakeForeignFailure(const std::string &endpoint,
   return std::make_shared<InvalidStateException>("The request to " + endpoint + " failed: " + text);
 }
 
-/// May fail for lack of memory.
+/// Throws when memory runs out.
 std::shared_ptr<const Exception> CopyCurrentFailure(const std::string &endpoint) {
   try {
     throw;
@@ -33,7 +33,7 @@ std::shared_ptr<const Exception> CopyCurrentFailure(const std::string &endpoint)
 
 const std::shared_ptr<const Exception> &OutOfMemory() {
   const Computation computing;
-  // Never destroyed, as the threads that use it never end before the process does.
+  // Never destroyed, because the threads that use it run until the process ends.
   static const auto *const failure = new std::shared_ptr<const Exception>(std::make_shared<OutOfMemoryException>());
   return *failure;
 }

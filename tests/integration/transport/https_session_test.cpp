@@ -106,7 +106,7 @@ TEST(HttpsSession, LetsNothingIntoTheHeaderThroughTheAction) {
   request.soapAction = "a\"\r\nX-Evil: 1";
   Ref<Tarvel::Reader> response;
   EXPECT_THROWS_MESSAGE(service.CreateSession()->SendRequest(request, response), Tarvel::InvalidArgumentException,
-                        "Invalid argument : the value of the HTTP header SOAPAction holds a control character.");
+                        "Invalid argument : the value of the HTTP header SOAPAction contains a control character.");
   EXPECT_EQ(service.GetServer().GetConnectionCount(), 0);
 }
 
