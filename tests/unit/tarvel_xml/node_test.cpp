@@ -44,7 +44,7 @@ std::string Lookup(const ElementNode &element, std::string_view prefix) {
   return element.LookupNamespace(prefix, uri) ? "bound to '" + std::string(uri) + "'" : "unbound";
 }
 
-TEST(CreateElementNode, MakesAnElementWithoutAnything) {
+TEST(CreateElementNode, MakesAnEmptyElement) {
   const Ref<ElementNode> element = MakeElement("Body", "soapenv");
   EXPECT_EQ(element->GetName(), "soapenv:Body");
   EXPECT_EQ(element->GetPrefix(), "soapenv");
@@ -59,14 +59,14 @@ TEST(CreateElementNode, MakesAnElementWithoutAnything) {
   EXPECT_EQ(element->GetColumn(), 0u);
 }
 
-TEST(CreateElementNode, LeavesThePrefixOutWhenThereIsNone) {
+TEST(CreateElementNode, MakesAnElementWithoutAPrefix) {
   const Ref<ElementNode> element = MakeElement("a");
   EXPECT_EQ(element->GetName(), "a");
   EXPECT_EQ(element->GetPrefix(), "");
   EXPECT_EQ(element->GetLocalName(), "a");
 }
 
-TEST(CreateElementNode, RefusesWhatIsNoName) {
+TEST(CreateElementNode, RefusesAnInvalidName) {
   Ref<ElementNode> element = MakeElement("kept");
   for (const std::string name :
        {"", "a:b", ":", "1a", "-a", ".a", "a b", "a<", "a\n", "\xC3\x97", "\xCC\x80", "\xFF", "a\xC3"}) {
@@ -98,7 +98,7 @@ TEST(CreateTextNode, MakesAnEmptyTextThatTakesValues) {
   }
 }
 
-TEST(SetValue, NamesTheByteOfAForbiddenCharacterWhereverItIs) {
+TEST(SetValue, ReportsTheByteOfAForbiddenCharacterAtEveryPosition) {
   Ref<TextNode> text;
   CreateTextNode(text);
   for (std::size_t before = 0; before < 20; ++before) {
@@ -113,7 +113,7 @@ TEST(SetValue, NamesTheByteOfAForbiddenCharacterWhereverItIs) {
 
 struct Forbidden {
   std::string value;
-  std::string message; // behind what names the text
+  std::string message; // after the words for the text
 };
 
 const Forbidden FORBIDDEN[] = {
@@ -145,7 +145,7 @@ TEST(DefineAttribute, RefusesWhatXmlCannotCarryAndKeepsTheElement) {
   EXPECT_EQ(element->GetFirstAttribute(), nullptr);
 }
 
-TEST(DefineAttribute, RefusesWhatIsNoQualifiedName) {
+TEST(DefineAttribute, RefusesAnInvalidQualifiedName) {
   const Ref<ElementNode> element = MakeElement("a");
   for (const std::string name : {"", ":", "a:", ":a", "a:b:c", "1", "a:1", "a b", "a=", "\xFF"}) {
     EXPECT_THROWS_MESSAGE(element->DefineAttribute(name, ""), InvalidArgumentException,
@@ -179,7 +179,7 @@ TEST(DefineAttribute, AddsToAParsedElement) {
   EXPECT_EQ(Lookup(*document->GetDocumentElement(), "p"), "bound to 'urn:p'");
 }
 
-TEST(Attribute, KnowsItsPartsAndWhetherItDeclaresANamespace) {
+TEST(Attribute, ReportsItsPartsAndWhetherItDeclaresANamespace) {
   const auto document = ParseDocument("<a x='1' p:y='2' xmlns='urn:d' xmlns:p='urn:p' xmlnsx='3' p:xmlns='4'/>");
   std::string seen;
   for (const Attribute *attribute = document->GetDocumentElement()->GetFirstAttribute(); attribute;
@@ -203,20 +203,20 @@ TEST(LookupNamespace, FindsTheInnermostDeclarationInScope) {
   EXPECT_EQ(Lookup(c, "q"), "unbound");
 }
 
-TEST(LookupNamespace, KnowsXmlAndXmlnsAndTheEmptyDefaultAlways) {
+TEST(LookupNamespace, AlwaysKnowsXmlAndXmlnsAndTheEmptyDefault) {
   const Ref<ElementNode> element = MakeElement("a");
   EXPECT_EQ(Lookup(*element, "xml"), "bound to 'http://www.w3.org/XML/1998/namespace'");
   EXPECT_EQ(Lookup(*element, "xmlns"), "bound to 'http://www.w3.org/2000/xmlns/'");
   EXPECT_EQ(Lookup(*element, ""), "bound to ''");
 }
 
-TEST(LookupNamespace, LeavesTheResultAloneForAnUnboundPrefix) {
+TEST(LookupNamespace, DoesNotChangeTheResultForAnUnboundPrefix) {
   std::string_view uri = "untouched";
   EXPECT_FALSE(MakeElement("a")->LookupNamespace("p", uri));
   EXPECT_EQ(uri, "untouched");
 }
 
-TEST(LookupNamespace, TakesAnEmptyDeclarationAsUnbinding) {
+TEST(LookupNamespace, TreatsAnEmptyDeclarationAsUnbinding) {
   const Ref<ElementNode> outer = MakeElement("a");
   const Ref<ElementNode> inner = MakeElement("b");
   outer->DefineAttribute("xmlns:p", "urn:p");
@@ -226,7 +226,7 @@ TEST(LookupNamespace, TakesAnEmptyDeclarationAsUnbinding) {
   EXPECT_EQ(Lookup(*inner, "p"), "unbound");
 }
 
-TEST(LookupNamespace, LooksAfreshAfterEachChange) {
+TEST(LookupNamespace, SeesEachChangeOfTheDeclarations) {
   const Ref<ElementNode> outer = MakeElement("a");
   const Ref<ElementNode> inner = MakeElement("b", "p");
   EXPECT_EQ(inner->GetQName(), QName("", "b"));
@@ -237,7 +237,7 @@ TEST(LookupNamespace, LooksAfreshAfterEachChange) {
   EXPECT_EQ(inner->GetQName(), QName("urn:inner", "b"));
 }
 
-TEST(HasQName, NeedsABoundPrefixAndBothTexts) {
+TEST(HasQName, RequiresABoundPrefixAndBothTexts) {
   const auto document = ParseDocument("<p:a xmlns:p='urn:p'><q:b/><c/></p:a>");
   const ElementNode &a = *document->GetDocumentElement();
   EXPECT_TRUE(a.HasQName("urn:p", "a"));
@@ -248,7 +248,7 @@ TEST(HasQName, NeedsABoundPrefixAndBothTexts) {
   EXPECT_TRUE(a.FindChildElement("c")->HasQName("", "c"));
 }
 
-TEST(FindAttribute, TakesAttributesWithoutPrefixForThoseInNoNamespace) {
+TEST(FindAttribute, FindsOnlyAttributesWithoutAPrefixInNoNamespace) {
   const auto document = ParseDocument("<a xmlns='urn:p' xmlns:p='urn:p' xmlns:q='urn:p' r:x='0' p:x='1' x='2'/>");
   const ElementNode &a = *document->GetDocumentElement();
   std::string_view value = "untouched";
@@ -312,7 +312,7 @@ TEST(AppendElement, MakesTheLastChild) {
             "<a><b></b><p:c x=\"1\"><" + std::string(3000, 'd') + ">text</" + std::string(3000, 'd') + "></p:c></a>");
 }
 
-TEST(AppendElement, RefusesWhatIsNoNameAndKeepsTheElement) {
+TEST(AppendElement, RefusesAnInvalidNameAndKeepsTheElement) {
   const Ref<ElementNode> a = MakeElement("a");
   EXPECT_THROWS_MESSAGE(a->AppendElement("", "b:c"), InvalidArgumentException,
                         "Invalid argument : the local name 'b:c' is not an XML name without a colon");
@@ -381,7 +381,7 @@ TEST(AppendChild, RefusesTheChildOfAnotherElement) {
   EXPECT_EQ(WriteElement(*a), "<a><b></b></a>");
 }
 
-TEST(AppendChild, TakesADocumentElementOutOfItsDocument) {
+TEST(AppendChild, RemovesADocumentElementFromItsDocument) {
   const Ref<ElementNode> envelope = MakeElement("envelope");
   const auto document = ParseDocument("<!--before--><a><b/></a><!--after-->");
   envelope->AppendChild(document->GetDocumentElement());
@@ -391,7 +391,7 @@ TEST(AppendChild, TakesADocumentElementOutOfItsDocument) {
   EXPECT_EQ(envelope->FindChildElement("a")->GetNextSibling(), nullptr);
 }
 
-TEST(AppendChild, TakesTheLastNodeOutOfItsDocument) {
+TEST(AppendChild, RemovesTheLastNodeFromItsDocument) {
   const auto document = ParseDocument("<a/><!--after-->");
   ElementNode *const a = document->GetDocumentElement();
   a->AppendChild(a->GetNextSibling());
@@ -402,7 +402,7 @@ TEST(AppendChild, TakesTheLastNodeOutOfItsDocument) {
   EXPECT_EQ(DescribeTree(*b), "(1:b(1:a comment=5:after))");
 }
 
-TEST(NodeLifetime, AReferenceToAnyNodeKeepsTheWholeTree) {
+TEST(Node, KeepsItsWholeTreeAlive) {
   Ref<const Node> inner;
   {
     const auto document = ParseDocument("<a x='1'><b>text &amp; more</b></a>");
@@ -411,7 +411,7 @@ TEST(NodeLifetime, AReferenceToAnyNodeKeepsTheWholeTree) {
   EXPECT_EQ(DescribeTree(*inner->GetRoot()), "(1:a @1:x=1:1(1:b text=11:text & more))");
 }
 
-TEST(NodeLifetime, AppendedTreesLiveTogetherFromEitherEnd) {
+TEST(Node, KeepsAppendedTreesAliveFromEitherEnd) {
   Ref<const Node> fromAbove;
   Ref<const Node> fromBelow;
   {
@@ -426,7 +426,7 @@ TEST(NodeLifetime, AppendedTreesLiveTogetherFromEitherEnd) {
   EXPECT_EQ(DescribeTree(*root), "(1:a(1:b(1:c)))");
 }
 
-TEST(NodeLifetime, TreesAppendedCrosswiseAreFreedTogether) {
+TEST(Node, LeaksNoTreesAppendedCrosswise) {
   // Arenas that owned each other here would leak, which the leak checker of the sanitizer build reports.
   const auto first = ParseDocument("<a><x/></a>");
   const auto second = ParseDocument("<b><y/></b><!--c-->");
@@ -438,7 +438,7 @@ TEST(NodeLifetime, TreesAppendedCrosswiseAreFreedTogether) {
   EXPECT_EQ(DescribeTree(*first->GetDocumentNode()), "(1:a(1:x(1:b(1:y(1:d comment=1:c)))))");
 }
 
-TEST(NodeLifetime, ComposesAndDropsAHundredThousandDeepTreeWithoutRecursion) {
+TEST(Node, IsComposedAndFreedInADepthOfAHundredThousandWithoutRecursion) {
   constexpr int DEPTH = 100'000;
   Ref<ElementNode> top = MakeElement("a");
   const ElementNode *const bottom = top.get();
@@ -452,7 +452,7 @@ TEST(NodeLifetime, ComposesAndDropsAHundredThousandDeepTreeWithoutRecursion) {
   EXPECT_EQ(WriteElement(*top).size(), std::size_t{DEPTH} * 7);
 }
 
-TEST(NodeLifetime, AppendsAHundredThousandChildrenInLinearTime) {
+TEST(Node, TakesAHundredThousandChildrenInLinearTime) {
   const Ref<ElementNode> top = MakeElement("a");
   for (int i = 0; i < 100'000; ++i) {
     top->AppendChild(MakeElement("b").get());
@@ -460,7 +460,7 @@ TEST(NodeLifetime, AppendsAHundredThousandChildrenInLinearTime) {
   EXPECT_EQ(WriteElement(*top).size(), 100'000u * 7 + 7);
 }
 
-TEST(NodeConcurrency, ATreeIsReadAndSharedByManyThreads) {
+TEST(Node, IsReadAndSharedByManyThreads) {
   const auto document = ParseDocument("<p:a xmlns:p='urn:p'><b x='1'>text</b><p:c/></p:a>");
   document->GetDocumentElement()->AppendChild(MakeElement("d", "p").get());
   const std::string expected = WriteElement(*document->GetDocumentElement());
@@ -481,7 +481,7 @@ TEST(NodeConcurrency, ATreeIsReadAndSharedByManyThreads) {
   EXPECT_EQ(wrong, 0);
 }
 
-TEST(NodeConcurrency, DocumentsAreParsedOnManyThreadsAtOnce) {
+TEST(Node, IsParsedOnManyThreadsAtOnce) {
   std::atomic<int> wrong{0};
   std::vector<std::thread> threads;
   for (int t = 0; t < 4; ++t) {
@@ -504,7 +504,7 @@ TEST(NodeConcurrency, DocumentsAreParsedOnManyThreadsAtOnce) {
   EXPECT_EQ(wrong, 0);
 }
 
-TEST(CheckedDowncasts, AreNullForNullAndForOtherKinds) {
+TEST(CheckedDowncasts, ReturnNullForNullAndForOtherKinds) {
   const auto document = ParseDocument("<a>text</a>");
   const Node *const element = document->GetDocumentElement();
   const Node *const text = element->GetFirstChild();
