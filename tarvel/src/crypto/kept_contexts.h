@@ -25,7 +25,7 @@ public:
 
   /// A kept context of that kind; null if there is none.
   Handle Acquire(std::size_t kind) noexcept {
-    for (std::size_t distance = 0; distance < LANES; ++distance) {
+    for (std::size_t distance = 0; distance < SHARDS; ++distance) {
       Slot &slot = GetSlot(distance, kind);
       if (!slot.load(std::memory_order_relaxed)) {
         continue;
@@ -39,7 +39,7 @@ public:
 
   /// Keeps `context` for reuse, or frees it if enough are kept already.
   void Return(std::size_t kind, Handle context) noexcept {
-    for (std::size_t distance = 0; distance < LANES; ++distance) {
+    for (std::size_t distance = 0; distance < SHARDS; ++distance) {
       Pointer expected = nullptr;
       if (GetSlot(distance, kind)
               .compare_exchange_strong(expected, context.get(), std::memory_order_release, std::memory_order_relaxed)) {
@@ -51,29 +51,29 @@ public:
 
   /// Frees all kept contexts. Only for the owner, while no other thread uses the object.
   void FreeAll() noexcept {
-    for (Lane &lane : m_lanes) {
-      for (Slot &slot : lane.slots) {
+    for (Shard &shard : m_shards) {
+      for (Slot &slot : shard.slots) {
         const Handle freed(slot.exchange(nullptr, std::memory_order_relaxed));
       }
     }
   }
 
 private:
-  static constexpr std::size_t LANES = 4; // threads beyond these that use contexts of one kind at once make their own
+  static constexpr std::size_t SHARDS = 4; // if more threads use one kind at once, the others make their own
 
   using Pointer = typename Handle::pointer;
   using Slot = std::atomic<Pointer>;
 
-  struct alignas(System::LANE_ALIGNMENT) Lane {
+  struct alignas(System::LANE_ALIGNMENT) Shard {
     std::array<Slot, KINDS> slots{};
   };
 
-  /// `distance` is counted in lanes from the calling thread's own.
+  /// The slot that is `distance` shards after that of the calling thread.
   Slot &GetSlot(std::size_t distance, std::size_t kind) noexcept {
-    return m_lanes[(System::GetThreadLane(LANES) + distance) % LANES].slots[kind];
+    return m_shards[(System::GetThreadLane(SHARDS) + distance) % SHARDS].slots[kind];
   }
 
-  std::array<Lane, LANES> m_lanes{};
+  std::array<Shard, SHARDS> m_shards{};
 };
 
 } // namespace Tarvel::Crypto

@@ -30,13 +30,13 @@ constexpr std::chrono::milliseconds MAX_WAIT{500};
 constexpr std::chrono::microseconds WAIT_STEP{100};
 
 /// The uses under way, counted per shard: a single counter would be a point of contention.
-struct alignas(System::LANE_ALIGNMENT) Lane {
+struct alignas(System::LANE_ALIGNMENT) Shard {
   std::atomic<std::uint32_t> uses{0};
 };
 
 // Constant-initialised and never destroyed. Both are sequentially consistent: either a use that begins sees `ended`, or the
 // clean-up sees the use.
-std::array<Lane, 16> lanes;
+std::array<Shard, 16> shards;
 std::atomic<bool> ended{false};
 
 struct Abandoned {
@@ -47,7 +47,7 @@ std::atomic<Abandoned *> abandoned{nullptr};
 
 /// Begins a use and returns the counter that counts it; null once the clean-up has begun.
 std::atomic<std::uint32_t> *TryBegin() noexcept {
-  std::atomic<std::uint32_t> &uses = lanes[System::GetThreadLane(lanes.size())].uses;
+  std::atomic<std::uint32_t> &uses = shards[System::GetThreadLane(shards.size())].uses;
   uses.fetch_add(1);
   if (ended.load()) {
     uses.fetch_sub(1);
@@ -57,7 +57,7 @@ std::atomic<std::uint32_t> *TryBegin() noexcept {
 }
 
 bool IsAnyGoingOn() noexcept {
-  return std::any_of(lanes.begin(), lanes.end(), [](const Lane &lane) { return lane.uses.load() != 0; });
+  return std::any_of(shards.begin(), shards.end(), [](const Shard &shard) { return shard.uses.load() != 0; });
 }
 
 void OnCleanUp() noexcept {

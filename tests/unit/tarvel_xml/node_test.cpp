@@ -2,6 +2,7 @@
 
 #include <tarvel/xml/node.h>
 
+#include "nodes.h"
 #include "support/throws_message.h"
 #include "support/xml_tree.h"
 
@@ -9,40 +10,22 @@
 
 #include <gtest/gtest.h>
 
-#include <atomic>
 #include <string>
-#include <thread>
 #include <type_traits>
-#include <vector>
 
 namespace Tarvel::Xml {
 namespace {
 
 using ::Testing::DescribeTree;
+using ::Testing::Lookup;
+using ::Testing::MakeElement;
+using ::Testing::MakeText;
 using ::Testing::ParseDocument;
 using ::Testing::WriteElement;
 using namespace std::string_literals;
 
 static_assert(std::is_trivially_destructible_v<Attribute>);
 static_assert(!std::is_copy_constructible_v<ElementNode> && !std::is_default_constructible_v<ElementNode>);
-
-Ref<ElementNode> MakeElement(std::string_view localName, std::string_view prefix = "") {
-  Ref<ElementNode> element;
-  CreateElementNode(prefix, localName, element);
-  return element;
-}
-
-Ref<TextNode> MakeText(std::string_view value) {
-  Ref<TextNode> text;
-  CreateTextNode(text);
-  text->SetValue(value);
-  return text;
-}
-
-std::string Lookup(const ElementNode &element, std::string_view prefix) {
-  std::string_view uri;
-  return element.LookupNamespace(prefix, uri) ? "bound to '" + std::string(uri) + "'" : "unbound";
-}
 
 TEST(CreateElementNode, MakesAnEmptyElement) {
   const Ref<ElementNode> element = MakeElement("Body", "soapenv");
@@ -188,64 +171,6 @@ TEST(Attribute, ReportsItsPartsAndWhetherItDeclaresANamespace) {
             (attribute->IsNamespaceDeclaration() ? " declares; " : "; ");
   }
   EXPECT_EQ(seen, "|x; p|y; |xmlns declares; xmlns|p declares; |xmlnsx; p|xmlns; ");
-}
-
-TEST(LookupNamespace, FindsTheInnermostDeclarationInScope) {
-  const auto document = ParseDocument("<a xmlns='urn:1' xmlns:p='urn:2'><b xmlns:p='urn:3'><c xmlns=''/></b></a>");
-  const ElementNode &a = *document->GetDocumentElement();
-  const ElementNode &b = *a.FindChildElement("b");
-  const ElementNode &c = *b.FindChildElement("c");
-  EXPECT_EQ(Lookup(a, ""), "bound to 'urn:1'");
-  EXPECT_EQ(Lookup(b, ""), "bound to 'urn:1'");
-  EXPECT_EQ(Lookup(c, ""), "bound to ''");
-  EXPECT_EQ(Lookup(a, "p"), "bound to 'urn:2'");
-  EXPECT_EQ(Lookup(c, "p"), "bound to 'urn:3'");
-  EXPECT_EQ(Lookup(c, "q"), "unbound");
-}
-
-TEST(LookupNamespace, AlwaysKnowsXmlAndXmlnsAndTheEmptyDefault) {
-  const Ref<ElementNode> element = MakeElement("a");
-  EXPECT_EQ(Lookup(*element, "xml"), "bound to 'http://www.w3.org/XML/1998/namespace'");
-  EXPECT_EQ(Lookup(*element, "xmlns"), "bound to 'http://www.w3.org/2000/xmlns/'");
-  EXPECT_EQ(Lookup(*element, ""), "bound to ''");
-}
-
-TEST(LookupNamespace, DoesNotChangeTheResultForAnUnboundPrefix) {
-  std::string_view uri = "untouched";
-  EXPECT_FALSE(MakeElement("a")->LookupNamespace("p", uri));
-  EXPECT_EQ(uri, "untouched");
-}
-
-TEST(LookupNamespace, TreatsAnEmptyDeclarationAsUnbinding) {
-  const Ref<ElementNode> outer = MakeElement("a");
-  const Ref<ElementNode> inner = MakeElement("b");
-  outer->DefineAttribute("xmlns:p", "urn:p");
-  inner->DefineAttribute("xmlns:p", "");
-  outer->AppendChild(inner.get());
-  EXPECT_EQ(Lookup(*outer, "p"), "bound to 'urn:p'");
-  EXPECT_EQ(Lookup(*inner, "p"), "unbound");
-}
-
-TEST(LookupNamespace, SeesEachChangeOfTheDeclarations) {
-  const Ref<ElementNode> outer = MakeElement("a");
-  const Ref<ElementNode> inner = MakeElement("b", "p");
-  EXPECT_EQ(inner->GetQName(), QName("", "b"));
-  outer->AppendChild(inner.get());
-  outer->DefineAttribute("xmlns:p", "urn:outer");
-  EXPECT_EQ(inner->GetQName(), QName("urn:outer", "b"));
-  inner->DefineAttribute("xmlns:p", "urn:inner");
-  EXPECT_EQ(inner->GetQName(), QName("urn:inner", "b"));
-}
-
-TEST(HasQName, RequiresABoundPrefixAndBothTexts) {
-  const auto document = ParseDocument("<p:a xmlns:p='urn:p'><q:b/><c/></p:a>");
-  const ElementNode &a = *document->GetDocumentElement();
-  EXPECT_TRUE(a.HasQName("urn:p", "a"));
-  EXPECT_FALSE(a.HasQName("urn:p", "b"));
-  EXPECT_FALSE(a.HasQName("urn:P", "a"));
-  EXPECT_FALSE(a.HasQName("", "a"));
-  EXPECT_FALSE(a.FindChildElement("b")->HasQName("", "b")) << "an unbound prefix has no namespace, not the empty one";
-  EXPECT_TRUE(a.FindChildElement("c")->HasQName("", "c"));
 }
 
 TEST(FindAttribute, FindsOnlyAttributesWithoutAPrefixInNoNamespace) {
@@ -400,108 +325,6 @@ TEST(AppendChild, RemovesTheLastNodeFromItsDocument) {
   b->AppendChild(a);
   EXPECT_EQ(DescribeTree(*document->GetDocumentNode()), "");
   EXPECT_EQ(DescribeTree(*b), "(1:b(1:a comment=5:after))");
-}
-
-TEST(Node, KeepsItsWholeTreeAlive) {
-  Ref<const Node> inner;
-  {
-    const auto document = ParseDocument("<a x='1'><b>text &amp; more</b></a>");
-    inner = Ref<const Node>(document->GetDocumentElement()->FindChildElement("b")->GetFirstChild());
-  }
-  EXPECT_EQ(DescribeTree(*inner->GetRoot()), "(1:a @1:x=1:1(1:b text=11:text & more))");
-}
-
-TEST(Node, KeepsAppendedTreesAliveFromEitherEnd) {
-  Ref<const Node> fromAbove;
-  Ref<const Node> fromBelow;
-  {
-    const Ref<ElementNode> a = MakeElement("a");
-    const auto document = ParseDocument("<b><c/></b>");
-    a->AppendChild(document->GetDocumentElement());
-    fromAbove = a;
-    fromBelow = Ref<const Node>(a->FindChildElement("b")->FindChildElement("c"));
-  }
-  const Node *const root = fromBelow->GetRoot();
-  fromAbove.reset();
-  EXPECT_EQ(DescribeTree(*root), "(1:a(1:b(1:c)))");
-}
-
-TEST(Node, LeaksNoTreesAppendedCrosswise) {
-  // Arenas that owned each other here would leak, which the leak checker of the sanitizer build reports.
-  const auto first = ParseDocument("<a><x/></a>");
-  const auto second = ParseDocument("<b><y/></b><!--c-->");
-  const Ref<ElementNode> third = MakeElement("d");
-  second->GetDocumentElement()->FindChildElement("y")->AppendChild(third.get());
-  Node *const comment = second->GetDocumentElement()->GetNextSibling();
-  first->GetDocumentElement()->FindChildElement("x")->AppendChild(second->GetDocumentElement());
-  third->AppendChild(comment);
-  EXPECT_EQ(DescribeTree(*first->GetDocumentNode()), "(1:a(1:x(1:b(1:y(1:d comment=1:c)))))");
-}
-
-TEST(Node, IsComposedAndFreedInADepthOfAHundredThousandWithoutRecursion) {
-  constexpr int DEPTH = 100'000;
-  Ref<ElementNode> top = MakeElement("a");
-  const ElementNode *const bottom = top.get();
-  for (int i = 1; i < DEPTH; ++i) {
-    const Ref<ElementNode> above = MakeElement("a");
-    above->AppendChild(top.get());
-    top = above;
-  }
-  EXPECT_EQ(bottom->GetRoot(), top.get());
-  EXPECT_EQ(Lookup(*bottom, "p"), "unbound");
-  EXPECT_EQ(WriteElement(*top).size(), std::size_t{DEPTH} * 7);
-}
-
-TEST(Node, TakesAHundredThousandChildrenInLinearTime) {
-  const Ref<ElementNode> top = MakeElement("a");
-  for (int i = 0; i < 100'000; ++i) {
-    top->AppendChild(MakeElement("b").get());
-  }
-  EXPECT_EQ(WriteElement(*top).size(), 100'000u * 7 + 7);
-}
-
-TEST(Node, IsReadAndSharedByManyThreads) {
-  const auto document = ParseDocument("<p:a xmlns:p='urn:p'><b x='1'>text</b><p:c/></p:a>");
-  document->GetDocumentElement()->AppendChild(MakeElement("d", "p").get());
-  const std::string expected = WriteElement(*document->GetDocumentElement());
-  std::atomic<int> wrong{0};
-  std::vector<std::thread> threads;
-  for (int t = 0; t < 4; ++t) {
-    threads.emplace_back([&] {
-      for (int i = 0; i < 500; ++i) {
-        const Ref<const Document> shared = document;
-        const Ref<const ElementNode> child(shared->GetDocumentElement()->FindChildElement(QName("urn:p", "d")));
-        wrong += !child || WriteElement(*AsElement(child->GetParent())) != expected;
-      }
-    });
-  }
-  for (std::thread &thread : threads) {
-    thread.join();
-  }
-  EXPECT_EQ(wrong, 0);
-}
-
-TEST(Node, IsParsedOnManyThreadsAtOnce) {
-  std::atomic<int> wrong{0};
-  std::vector<std::thread> threads;
-  for (int t = 0; t < 4; ++t) {
-    threads.emplace_back([&wrong, t] {
-      for (int i = 0; i < 200; ++i) {
-        const std::string text = "<a" + std::to_string(t) + ">" + std::to_string(i) + "</a" + std::to_string(t) + ">";
-        wrong += WriteElement(*ParseDocument(text)->GetDocumentElement()) != text;
-        try {
-          ParseDocument(text + "<");
-          ++wrong;
-        } catch (const XMLParseException &) {
-          continue;
-        }
-      }
-    });
-  }
-  for (std::thread &thread : threads) {
-    thread.join();
-  }
-  EXPECT_EQ(wrong, 0);
 }
 
 TEST(CheckedDowncasts, ReturnNullForNullAndForOtherKinds) {
