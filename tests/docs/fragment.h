@@ -37,6 +37,6 @@
 #define PARAMETERS                                                                                                     \
   [[maybe_unused]] const std::shared_ptr<const SsoClient::SecurityTokenService> &service,                              \
       [[maybe_unused]] SsoClient::SecurityTokenServiceConfig &config, [[maybe_unused]] SsoClient::TokenSpec &spec,     \
-      [[maybe_unused]] std::shared_ptr<const SsoClient::SamlToken> &token,                                       \
+      [[maybe_unused]] std::shared_ptr<const SsoClient::SamlToken> &token,                                             \
       [[maybe_unused]] const Tarvel::Crypto::CertificateList &trusted, [[maybe_unused]] const std::string &xml,        \
       [[maybe_unused]] const std::string &password, [[maybe_unused]] const Tarvel::SecretText &secret

@@ -22,6 +22,7 @@ namespace Tarvel::Xml {
 /// The message ends in " at line L, column C".
 class TARVEL_API XMLParseException : public Exception {
 public:
+  /// An exception with the message `detail`, followed by the position.
   XMLParseException(const std::string &detail, std::uint32_t line, std::uint32_t column);
   XMLParseException(const XMLParseException &) noexcept = default;
   XMLParseException &operator=(const XMLParseException &) noexcept = default;
@@ -72,8 +73,11 @@ struct AttributeEvent {
   std::string_view value;       ///< normalised: references and white space replaced (XML 1.0, section 3.3.3)
   std::size_t prefixLength = 0; ///< of the name's prefix, 0 without one
 
+  /// The prefix; empty without one.
   std::string_view GetPrefix() const noexcept { return name.substr(0, prefixLength); }
+  /// The name without the prefix.
   std::string_view GetLocalName() const noexcept { return prefixLength ? name.substr(prefixLength + 1) : name; }
+  /// Whether it is `xmlns` or `xmlns:p`.
   bool IsNamespaceDeclaration() const noexcept { return (prefixLength ? GetPrefix() : name) == "xmlns"; }
 };
 
