@@ -1,16 +1,10 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// What a C++ block without an #include of its own may use: these headers, and in the body of a function these parameters.
+/// What a C++ block without an #include of its own may use: these headers and, outside of functions, these parameters.
 
 #pragma once
 
-#include <ssoclient/as_future.h>
-#include <ssoclient/create_saml_token.h>
-#include <ssoclient/descriptions.h>
-#include <ssoclient/exceptions.h>
-#include <ssoclient/gss_negotiation_context.h>
-#include <ssoclient/logger.h>
-#include <ssoclient/security_token_service.h>
+#include <ssoclient/ssoclient.h>
 #include <tarvel/core/checked_cast.h>
 #include <tarvel/core/secret_text.h>
 #include <tarvel/core/string_util.h>
