@@ -21,3 +21,4 @@
 #include <ssoclient/security_token_service.h>
 #include <ssoclient/security_token_service_config.h>
 #include <ssoclient/token_spec.h>
+#include <ssoclient/version.h>
