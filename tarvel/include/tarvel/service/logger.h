@@ -54,6 +54,7 @@ public:
 
   /// The highest level that is written; one atomic load. A line of level n is written when this is at least n.
   int GetLevel() const noexcept { return m_level.load(std::memory_order_relaxed); }
+  /// Sets it; other threads see the change soon.
   void SetLevel(int level) noexcept { m_level.store(level, std::memory_order_relaxed); }
 
   /// Writes one line, whatever its level; callers test `GetLevel` first. Never throws.

@@ -135,10 +135,13 @@ public:
 
   /// The name as written, prefix included.
   std::string_view GetName() const noexcept { return m_name; }
+  /// The prefix; empty without one.
   std::string_view GetPrefix() const noexcept {
     return m_prefixLength ? m_name.substr(0, m_prefixLength) : std::string_view();
   }
+  /// The name without the prefix.
   std::string_view GetLocalName() const noexcept { return m_prefixLength ? m_name.substr(m_prefixLength + 1) : m_name; }
+  /// The value, with references and white space replaced (XML 1.0, section 3.3.3).
   std::string_view GetValue() const noexcept { return m_value; }
 
   /// Whether this is "xmlns" or "xmlns:" followed by a prefix.
@@ -165,9 +168,11 @@ class TARVEL_API ElementNode final : public Node {
 public:
   /// The name as written, prefix included.
   std::string_view GetName() const noexcept { return m_name; }
+  /// The prefix; empty without one.
   std::string_view GetPrefix() const noexcept {
     return m_prefixLength ? m_name.substr(0, m_prefixLength) : std::string_view();
   }
+  /// The name without the prefix.
   std::string_view GetLocalName() const noexcept { return m_prefixLength ? m_name.substr(m_prefixLength + 1) : m_name; }
 
   /// Where the start tag begins in the source: line and column from 1, the column in bytes; both 0 for an element that
