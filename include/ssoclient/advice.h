@@ -11,13 +11,13 @@ namespace SsoClient {
 
 /// One attribute of an advice.
 struct AdviceAttribute {
-  std::string name;
+  std::string name;                ///< the name of the attribute
   std::vector<std::string> values; ///< in order
 };
 
 /// The attributes that one source states.
 struct Advice {
-  std::string source;
+  std::string source;                      ///< the name of the source
   std::vector<AdviceAttribute> attributes; ///< in order
 };
 

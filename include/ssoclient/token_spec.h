@@ -32,13 +32,13 @@ struct SSOCLIENT_API TokenSpec {
   TokenSpec(TokenSpec &&other) noexcept; ///< leaves audiences and advice of `other` empty
   ~TokenSpec();
 
-  std::int64_t tokenLifetimeSec = 0;         ///< requested lifetime in seconds; must be positive
-  std::set<std::string> audienceRestriction; ///< restricts the token to these audiences, if any
-  std::vector<Advice> advice;                ///< advice for the token, in order
-  bool delegable = false;                    ///< requests a token that may be delegated
-  boost::optional<std::string> delegateTo;   ///< delegates the token to this principal
-  bool renewable = false;                    ///< requests a token that may be renewed
-  Confirmation confirmation = CONFIRMATION_DEFAULT;
+  std::int64_t tokenLifetimeSec = 0;                ///< requested lifetime in seconds; must be positive
+  std::set<std::string> audienceRestriction;        ///< restricts the token to these audiences, if any
+  std::vector<Advice> advice;                       ///< advice for the token, in order
+  bool delegable = false;                           ///< requests a token that may be delegated
+  boost::optional<std::string> delegateTo;          ///< delegates the token to this principal
+  bool renewable = false;                           ///< requests a token that may be renewed
+  Confirmation confirmation = CONFIRMATION_DEFAULT; ///< requests this subject confirmation
 };
 
 } // namespace SsoClient

@@ -1,6 +1,7 @@
 # SPDX-License-Identifier: Apache-2.0
 # What Doxygen reads of a public header: the same lines, with what our way of writing leaves to the reader made explicit.
-# - Declarations without a blank line between them share the comment above the first; each gets it.
+# - Declarations without a blank line between them share the comment above the first, or above the namespace that begins with
+#   them; each gets it. What overrides a function has that function's comment.
 # - In a group of members (@name, @{) each gets the group's comment.
 # - Copying, moving, destroying and calling say nothing that the class's comment does not; they are left out unless they have
 #   a comment of their own.
@@ -40,7 +41,7 @@ function Advance(code, net) {
     isContinued = bodyDepth > 0
   } else {
     isContinued = code !~ /[;{}] *$/
-    if (net != 0) {
+    if (net != 0 && code !~ /^ *namespace /) {
       shared = ""
     }
   }
@@ -98,7 +99,7 @@ isMacro || /^ *#/ {
       shared = text
     } else if (IsSpecialMember(code)) {
       isLeftOut = 1
-    } else if (shared != "" && $0 !~ /\/\/\/</ && code !~ /^ *[{}]/) {
+    } else if (shared != "" && $0 !~ /\/\/\/</ && code !~ / override[ ;]/ && code !~ /^ *[{}]/) {
       match($0, /^ */)
       $0 = substr($0, 1, RLENGTH) "/** " shared " */ " substr($0, RLENGTH + 1)
     }

@@ -1,7 +1,7 @@
 # SPDX-License-Identifier: Apache-2.0
 # Takes the code blocks out of pages and header comments: block N becomes the file FOLDER/N.LANGUAGE, and is listed as
-# "N LANGUAGE FILE LINE" with the line before its first one. A block without a language, or with one that is not known
-# here, is an error.
+# "N LANGUAGE FILE LINE" with the line before its first one. A block without a language, or in one that is not listed
+# here, is an error. In a header's comment, lines that are indented by four after an empty line are a C++ block, too.
 #
 # usage: awk -v folder=FOLDER -f blocks.awk FILE…
 
@@ -12,36 +12,62 @@ BEGIN {
   }
 }
 
-function Fail(message) {
-  print FILENAME ":" FNR ": " message > "/dev/stderr"
+function Fail(place, message) {
+  print place ": " message > "/dev/stderr"
   hasFailed = 1
 }
 
+function Begin(language, line) {
+  begun = FILENAME ":" line
+  output = folder "/" ++count "." language
+  printf "" > output
+  print count, language, FILENAME, line
+}
+
+function EndIndented() {
+  if (isIndented) {
+    close(output)
+    output = ""
+    isIndented = 0
+  }
+}
+
 FNR == 1 {
+  EndIndented()
   if (output) {
-    Fail("the page before ends within a code block")
+    Fail(begun, "this code block does not end")
   }
   output = ""
   isHeader = FILENAME ~ /\.h$/
 }
 
 isHeader && !/^ *\/\/\// {
+  EndIndented()
+  isAfterEmpty = 0
   next
 }
 
 isHeader {
   sub(/^ *\/\/\/ ?/, "")
+  if (/^    / && (isAfterEmpty || isIndented)) {
+    if (!isIndented) {
+      Begin("cpp", FNR - 1)
+      isIndented = 1
+    }
+    print > output
+    next
+  }
+  EndIndented()
+  isAfterEmpty = /^$/
 }
 
 /^ *```/ && !output {
   language = $0
   sub(/^ *```/, "", language)
   if (!isKnown[language]) {
-    Fail("a code block in the language '" language "', not one of cpp, cmake, sh, text and json")
+    Fail(FILENAME ":" FNR, "a code block in the language '" language "', not one of cpp, cmake, sh, text and json")
   }
-  output = folder "/" ++count "." language
-  printf "" > output
-  print count, language, FILENAME, FNR
+  Begin(language, FNR)
   next
 }
 
@@ -56,8 +82,8 @@ output {
 }
 
 END {
-  if (output) {
-    Fail("ends within a code block")
+  if (output && !isIndented) {
+    Fail(begun, "this code block does not end")
   }
   exit hasFailed
 }

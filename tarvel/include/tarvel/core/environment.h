@@ -22,6 +22,7 @@ struct Environment {
 /// nest. The functions are called on any thread. For tests: a service must never use it.
 class TARVEL_API ScopedEnvironment {
 public:
+  /// From now on, `environment` answers instead of the real sources.
   explicit ScopedEnvironment(Environment environment);
   ScopedEnvironment(const ScopedEnvironment &) = delete;
   ScopedEnvironment &operator=(const ScopedEnvironment &) = delete;

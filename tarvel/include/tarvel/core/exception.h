@@ -15,6 +15,7 @@ namespace Tarvel {
 /// A message text and the call stack at the place where the exception was made.
 class TARVEL_API Exception : public std::exception {
 public:
+  /// An exception with the message and the current call stack.
   explicit Exception(const std::string &message);
   Exception(const Exception &) noexcept;
   Exception &operator=(const Exception &) noexcept;
@@ -74,6 +75,7 @@ public:                                                                         
 /// An invalid argument. The message is "Invalid argument : " followed by the constructor's `detail`.
 class TARVEL_API InvalidArgumentException : public Exception {
 public:
+  /// An exception whose message ends with `detail`.
   explicit InvalidArgumentException(const std::string &detail);
   InvalidArgumentException(const InvalidArgumentException &) noexcept = default;
   InvalidArgumentException &operator=(const InvalidArgumentException &) noexcept = default;
@@ -113,6 +115,7 @@ public:
   OutOfMemoryException(const OutOfMemoryException &) noexcept = default;
   OutOfMemoryException &operator=(const OutOfMemoryException &) noexcept = default;
   ~OutOfMemoryException() override;
+  /// Always "There is not enough memory".
   const char *what() const noexcept override;
   OutOfMemoryException *Clone() const override;
   [[noreturn]] void Throw() const override;

@@ -17,6 +17,7 @@ namespace Tarvel {
 /// ("true", "false") and pointers (hexadecimal, "(null)" when null) have theirs already.
 namespace MessageArguments {
 
+/// The text of an argument of a message.
 TARVEL_API std::string FormatMessageArgument(bool value);
 TARVEL_API std::string FormatMessageArgument(char value);
 TARVEL_API std::string FormatMessageArgument(long long value);
@@ -26,6 +27,7 @@ TARVEL_API std::string FormatMessageArgument(const char *value);
 TARVEL_API std::string FormatMessageArgument(const void *value);
 TARVEL_API std::string FormatMessageArgument(std::string_view value);
 
+/// The text of an argument of any type that has a `FormatMessageArgument`.
 template <typename T>
 std::string ToText(const T &value) {
   if constexpr (std::is_same_v<T, bool> || std::is_same_v<T, char>) {

@@ -37,6 +37,7 @@ public:
   /// SHA-256 over the DER encoding, 64 lower-case hexadecimal digits.
   virtual std::string GetSha256Thumbprint() const = 0;
 
+  /// The first and the last moment at which the certificate is valid.
   virtual System::DateTime GetNotBefore() const = 0;
   virtual System::DateTime GetNotAfter() const = 0;
 
@@ -47,6 +48,7 @@ protected:
   ~Certificate() override;
 };
 
+/// Certificates in order. Elements may be null only where a comment says so.
 using CertificateList = std::vector<Ref<const Certificate>>;
 
 /// Decodes the certificate in DER form that the `length` bytes at `data` contain.

@@ -60,9 +60,9 @@ TARVEL_API Ref<const PrivateKey> LoadPrivateKey(const std::string &pathOrUri,
 
 /// A private key, its certificate, and the other certificates of a key store.
 struct KeyStore {
-  Ref<const PrivateKey> privateKey;
-  Ref<const Certificate> certificate;
-  CertificateList others;
+  Ref<const PrivateKey> privateKey;   ///< never null
+  Ref<const Certificate> certificate; ///< of the key; never null
+  CertificateList others;             ///< in the order of the store
 };
 
 /// Reads a key store in PKCS#12 form (RFC 7292).

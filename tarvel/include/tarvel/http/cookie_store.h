@@ -26,6 +26,7 @@ public:
   /// The Cookie header's value for a request; empty when there is no cookie to send.
   virtual std::string GetHeader(std::string_view host, std::string_view path, bool isSecure) const = 0;
 
+  /// The number of cookies in the store.
   virtual std::size_t GetCount() const = 0;
 
 protected:

@@ -53,7 +53,9 @@ protected:
 /// received one.
 class TARVEL_API ClientResponse : public Reader {
 public:
+  /// The status code of the status line, for example 200.
   virtual int GetStatusCode() const noexcept = 0;
+  /// The text after the status code; may be empty.
   virtual const std::string &GetReasonPhrase() const noexcept = 0;
   /// The value of a header, the first of that name in any letter case; false when there is none.
   virtual bool GetHeader(std::string_view name, std::string &value) const = 0;

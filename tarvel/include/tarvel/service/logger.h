@@ -17,9 +17,9 @@ namespace Tarvel::Service {
 
 /// One line for the sink. The texts are valid during the call only.
 struct LogRecord {
-  std::string_view logger; ///< the logger's name
-  int level;               ///< the line's level: the higher, the more detailed
-  std::string_view message;
+  std::string_view logger;  ///< the logger's name
+  int level;                ///< the line's level: the higher, the more detailed
+  std::string_view message; ///< the text of the line
 };
 
 /// The host's function for one line. Called on the thread that logs, possibly on several at once; an exception that leaves
@@ -49,10 +49,12 @@ public:
   /// A logger of that name on `root` that writes lines of up to `level`.
   static Ref<Logger> CreateLogger(const Ref<LogRoot> &root, std::string name, int level);
 
+  /// The name that the logger was made with.
   virtual const std::string &GetName() const noexcept = 0;
 
   /// The highest level that is written; one atomic load. A line of level n is written when this is at least n.
   int GetLevel() const noexcept { return m_level.load(std::memory_order_relaxed); }
+  /// Sets it; other threads see the change soon.
   void SetLevel(int level) noexcept { m_level.store(level, std::memory_order_relaxed); }
 
   /// Writes one line, whatever its level; callers test `GetLevel` first. Never throws.

@@ -13,6 +13,7 @@
 
 namespace Tarvel::System {
 
+/// The number of microseconds in a second.
 constexpr std::int64_t MICROSECONDS_PER_SECOND = 1'000'000;
 
 /// `seconds` in microseconds, or the nearest `std::int64_t` to that: an absurd number means "always" or "never", and does not

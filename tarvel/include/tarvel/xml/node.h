@@ -33,6 +33,7 @@ enum class CharacterForm : std::uint8_t {
   ///< references
 };
 
+/// The kind of a node, which says its class.
 enum class NodeKind : std::uint8_t { DOCUMENT, ELEMENT, TEXT, COMMENT, PROCESSING_INSTRUCTION };
 
 /// The base of all nodes. Nodes are made by the factories below and by the parser, never copied.
@@ -41,14 +42,17 @@ public:
   Node(const Node &) = delete;
   Node &operator=(const Node &) = delete;
 
+  /// The kind of the node.
   NodeKind GetKind() const noexcept { return m_kind; }
 
   /// The element or document that the node is a child of, or null.
   const Node *GetParent() const noexcept { return m_parent; }
   Node *GetParent() noexcept { return m_parent; }
 
+  /// The first child, or null.
   const Node *GetFirstChild() const noexcept { return m_firstChild; }
   Node *GetFirstChild() noexcept { return m_firstChild; }
+  /// The next child of the same parent, or null.
   const Node *GetNextSibling() const noexcept { return m_nextSibling; }
   Node *GetNextSibling() noexcept { return m_nextSibling; }
 
@@ -81,6 +85,7 @@ protected:
 /// Character data; adjacent character data and CDATA sections of a source are one node.
 class TARVEL_API TextNode final : public Node {
 public:
+  /// The text.
   std::string_view GetValue() const noexcept { return m_value; }
 
   /// @throws InvalidArgumentException when `value` is not UTF-8 or contains a character that XML 1.0 cannot carry.
@@ -93,8 +98,10 @@ private:
   friend class TreeBuilder;
 };
 
+/// A comment.
 class TARVEL_API CommentNode final : public Node {
 public:
+  /// The text between `<!--` and `-->`.
   std::string_view GetValue() const noexcept { return m_value; }
 
 private:
@@ -104,9 +111,12 @@ private:
   friend class TreeBuilder;
 };
 
+/// A processing instruction.
 class TARVEL_API ProcessingInstructionNode final : public Node {
 public:
+  /// The target: the name after `<?`.
   std::string_view GetTarget() const noexcept { return m_target; }
+  /// The text after the target; may be empty.
   std::string_view GetData() const noexcept { return m_data; }
 
 private:
@@ -125,10 +135,13 @@ public:
 
   /// The name as written, prefix included.
   std::string_view GetName() const noexcept { return m_name; }
+  /// The prefix; empty without one.
   std::string_view GetPrefix() const noexcept {
     return m_prefixLength ? m_name.substr(0, m_prefixLength) : std::string_view();
   }
+  /// The name without the prefix.
   std::string_view GetLocalName() const noexcept { return m_prefixLength ? m_name.substr(m_prefixLength + 1) : m_name; }
+  /// The value, with references and white space replaced (XML 1.0, section 3.3.3).
   std::string_view GetValue() const noexcept { return m_value; }
 
   /// Whether this is "xmlns" or "xmlns:" followed by a prefix.
@@ -150,13 +163,16 @@ private:
   friend class TreeBuilder;
 };
 
+/// An element with its attributes and children.
 class TARVEL_API ElementNode final : public Node {
 public:
   /// The name as written, prefix included.
   std::string_view GetName() const noexcept { return m_name; }
+  /// The prefix; empty without one.
   std::string_view GetPrefix() const noexcept {
     return m_prefixLength ? m_name.substr(0, m_prefixLength) : std::string_view();
   }
+  /// The name without the prefix.
   std::string_view GetLocalName() const noexcept { return m_prefixLength ? m_name.substr(m_prefixLength + 1) : m_name; }
 
   /// Where the start tag begins in the source: line and column from 1, the column in bytes; both 0 for an element that
@@ -176,6 +192,7 @@ public:
   /// Whether the element has that local name and its prefix is bound to that namespace.
   bool HasQName(std::string_view namespaceUri, std::string_view localName) const noexcept;
 
+  /// The first attribute, namespace declarations included, or null.
   const Attribute *GetFirstAttribute() const noexcept { return m_firstAttribute; }
 
   /// The attribute of that qualified name (an empty namespace means: written without a prefix), or null. Namespace

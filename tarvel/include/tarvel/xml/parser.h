@@ -22,6 +22,7 @@ namespace Tarvel::Xml {
 /// The message ends in " at line L, column C".
 class TARVEL_API XMLParseException : public Exception {
 public:
+  /// An exception with the message `detail`, followed by the position.
   XMLParseException(const std::string &detail, std::uint32_t line, std::uint32_t column);
   XMLParseException(const XMLParseException &) noexcept = default;
   XMLParseException &operator=(const XMLParseException &) noexcept = default;
@@ -72,8 +73,11 @@ struct AttributeEvent {
   std::string_view value;       ///< normalised: references and white space replaced (XML 1.0, section 3.3.3)
   std::size_t prefixLength = 0; ///< of the name's prefix, 0 without one
 
+  /// The prefix; empty without one.
   std::string_view GetPrefix() const noexcept { return name.substr(0, prefixLength); }
+  /// The name without the prefix.
   std::string_view GetLocalName() const noexcept { return prefixLength ? name.substr(prefixLength + 1) : name; }
+  /// Whether it is `xmlns` or `xmlns:p`.
   bool IsNamespaceDeclaration() const noexcept { return (prefixLength ? GetPrefix() : name) == "xmlns"; }
 };
 
@@ -83,12 +87,16 @@ public:
   /// A document begins. `source` is its text. It is valid and does not move as long as `owner` exists, so that views of it
   /// need not be copied.
   virtual void StartDocument(std::string_view source, const Ref<Object> &owner) = 0;
+  /// A start tag. `attributes` has `count` elements in the order of the tag; line and column are where the tag begins, from 1.
   virtual void StartElement(std::string_view name, const AttributeEvent *attributes, std::size_t count,
                             std::uint32_t line, std::uint32_t column) = 0;
+  /// The end tag of the element that was started last and has not ended.
   virtual void EndElement() = 0;
   /// Character data up to the next other event, CDATA sections included; never empty.
   virtual void Characters(std::string_view text) = 0;
+  /// A comment: the text between `<!--` and `-->`.
   virtual void Comment(std::string_view text) = 0;
+  /// A processing instruction; `data` may be empty.
   virtual void ProcessingInstruction(std::string_view target, std::string_view data) = 0;
   /// The result; called once, after the end of a well-formed document.
   virtual Ref<Object> TakeResult() = 0;

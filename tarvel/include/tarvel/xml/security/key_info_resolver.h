@@ -16,6 +16,7 @@ namespace Tarvel::Xml::Security {
 /// Supplies the certificates whose keys a signature may have been made with. Immutable; safe on any thread.
 class TARVEL_API KeyInfoResolver : public Object {
 public:
+  /// The candidates, in order.
   using CertificateList = std::vector<Ref<const Crypto::Certificate>>;
 
   /// The candidates for a signature, in the order in which to try them.
