@@ -37,7 +37,7 @@ constexpr FaultName AUTHENTICATION_FAULTS[] = {
     {Namespaces::WSSE, "InvalidSecurityToken"},
 };
 
-bool MeansFailedAuthentication(const QName &faultCode) {
+bool IsAuthenticationFailure(const QName &faultCode) {
   return std::any_of(std::begin(AUTHENTICATION_FAULTS), std::end(AUTHENTICATION_FAULTS), [&](const FaultName &name) {
     return faultCode.namespaceUri == name.namespaceUri && faultCode.localName == name.localName;
   });
@@ -82,7 +82,7 @@ void CheckSoapFault(const ElementNode &envelope) {
   QName name;
   ResolveQName(*faultCode, codeText->GetValue(), Namespaces::SOAPENV, name);
   const std::string faultString = GetText(GetTextNode(fault->FindChildElement("faultstring")));
-  if (MeansFailedAuthentication(name)) {
+  if (IsAuthenticationFailure(name)) {
     throw InvalidCredentialsException("Authentication failed" + (faultString.empty() ? "" : ": " + faultString));
   }
   throw SsoException("Unexpected SOAP fault: " + GetText(codeText) + "; request failed.");

@@ -46,7 +46,7 @@ public:
 
   /// Shakes hands, when the server has TLS; whether that went well. A script calls it first, unless it wants to disturb
   /// the handshake.
-  bool ShakeHands();
+  bool Handshake();
 
   /// At most `limit` bytes; empty when the peer has ended the connection in whatever way.
   std::string ReadSome(std::size_t limit = 65536);

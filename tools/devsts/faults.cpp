@@ -171,7 +171,7 @@ void Remove(xmlNode *element) {
 }
 
 /// What is wrong with a leg of a negotiation. A response without one stays as it is.
-void SpoilLeg(xmlNode *root, DocumentFault fault) {
+void CorruptLeg(xmlNode *root, DocumentFault fault) {
   xmlNode *const response = FindBelow(root, "RequestSecurityTokenResponse");
   xmlNode *const exchange = FindBelow(root, "BinaryExchange");
   if (!response || !exchange) {
@@ -268,7 +268,7 @@ std::string FaultHelp() {
   return help + line + "\n";
 }
 
-void SpoilFacts(TokenFacts &facts, TokenFault fault) {
+void CorruptFacts(TokenFacts &facts, TokenFault fault) {
   const auto life = facts.notOnOrAfter - facts.notBefore;
   constexpr std::chrono::hours DAY(24);
   switch (fault) {
@@ -301,7 +301,7 @@ void SpoilFacts(TokenFacts &facts, TokenFault fault) {
   }
 }
 
-void SpoilToken(xmlDoc &token, TokenFault fault) {
+void CorruptToken(xmlDoc &token, TokenFault fault) {
   xmlNode &assertion = *xmlDocGetRootElement(&token);
   switch (fault) {
   case TokenFault::NO_SUBJECT: {
@@ -326,7 +326,7 @@ void TamperWith(xmlDoc &token) {
   SetText(RequireChild(subject, Ns::SAML, "NameID"), "mallory@corp.example");
 }
 
-std::string SpoilResponse(xmlDoc &response, DocumentFault fault) {
+std::string CorruptResponse(xmlDoc &response, DocumentFault fault) {
   xmlNode *const root = xmlDocGetRootElement(&response);
   switch (fault) {
   case DocumentFault::NO_TOKEN:
@@ -352,7 +352,7 @@ std::string SpoilResponse(xmlDoc &response, DocumentFault fault) {
   case DocumentFault::GARBAGE_LEG:
   case DocumentFault::NO_CONTEXT:
   case DocumentFault::OTHER_CONTEXT:
-    SpoilLeg(root, fault);
+    CorruptLeg(root, fault);
     break;
   case DocumentFault::GARBLED_XML: {
     const std::string text = Serialise(response);

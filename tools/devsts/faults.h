@@ -85,15 +85,15 @@ std::optional<Fault> ParseFault(std::string_view name);
 std::string FaultHelp();
 
 /// Makes the facts wrong as the fault wants it, before the token is built.
-void SpoilFacts(TokenFacts &facts, TokenFault fault);
+void CorruptFacts(TokenFacts &facts, TokenFault fault);
 
 /// Makes the token wrong as the fault wants it, before it is signed.
-void SpoilToken(xmlDoc &token, TokenFault fault);
+void CorruptToken(xmlDoc &token, TokenFault fault);
 
 /// Changes the subject of a token that is signed already.
 void TamperWith(xmlDoc &token);
 
 /// The text of a response once the fault has been at it.
-std::string SpoilResponse(xmlDoc &response, DocumentFault fault);
+std::string CorruptResponse(xmlDoc &response, DocumentFault fault);
 
 } // namespace DevSts

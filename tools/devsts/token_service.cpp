@@ -141,7 +141,7 @@ SoapAnswer TokenService::Answer(std::string_view action, std::string_view messag
     if (fault.document == DocumentFault::SOAP_FAULT_WITHOUT_TEXT) {
       throw Refusal(Code::FAILED_AUTHENTICATION, "");
     }
-    answer.body = SpoilResponse(*response, fault.document);
+    answer.body = CorruptResponse(*response, fault.document);
   } catch (const Refusal &refusal) {
     const FaultCode &code = refusal.GetCode();
     answer.status = 500;
@@ -307,9 +307,9 @@ TokenFacts TokenService::FactsOfCertificate(X509 &certificate) const {
 }
 
 Document TokenService::MakeToken(TokenFacts facts, TokenFault fault) const {
-  SpoilFacts(facts, fault);
+  CorruptFacts(facts, fault);
   Document token = BuildToken(facts);
-  SpoilToken(*token, fault);
+  CorruptToken(*token, fault);
   if (fault != TokenFault::UNSIGNED) {
     SignToken(*token, fault == TokenFault::WRONG_SIGNER ? m_foreignSigner : m_signer);
   }

@@ -22,7 +22,7 @@ constexpr const char *WST = "http://docs.oasis-open.org/ws-sx/ws-trust/200512";
 class RefusedMessages : public testing::Test {
 protected:
   HttpAnswer SendText(const std::string &text) { return Post(m_service, SsoClient::Request::ISSUE, text); }
-  HttpAnswer SendSpoilt(const std::string &from, const std::string &to) {
+  HttpAnswer SendCorrupted(const std::string &from, const std::string &to) {
     return SendText(Replaced(PasswordRequest().body, from, to));
   }
 
@@ -104,7 +104,7 @@ TEST_F(Credentials, UnknownUser) {
 }
 
 TEST_F(Credentials, PasswordDigest) {
-  EXPECT_TRUE(IsRefused(SendSpoilt("#PasswordText", "#PasswordDigest"), "wsse:UnsupportedSecurityToken",
+  EXPECT_TRUE(IsRefused(SendCorrupted("#PasswordText", "#PasswordDigest"), "wsse:UnsupportedSecurityToken",
                         "a password must be given as text"));
 }
 
@@ -114,7 +114,7 @@ TEST_F(Credentials, None) {
 }
 
 TEST_F(Credentials, UnknownKind) {
-  EXPECT_TRUE(IsRefused(SendSpoilt("<wsse:UsernameToken ", "<wsse:Kerberos/><wsse:UsernameToken "),
+  EXPECT_TRUE(IsRefused(SendCorrupted("<wsse:UsernameToken ", "<wsse:Kerberos/><wsse:UsernameToken "),
                         "wsse:UnsupportedSecurityToken", "unknown element in the security header: 'Kerberos'"));
 }
 
@@ -149,7 +149,7 @@ TEST_F(Proof, HolderOfKeyWithoutSignature) {
 }
 
 TEST_F(Proof, KeyTypeChangedToHolderOfKey) {
-  EXPECT_TRUE(IsRefused(SendSpoilt("/Bearer<", "/PublicKey<"), "wst:InvalidRequest",
+  EXPECT_TRUE(IsRefused(SendCorrupted("/Bearer<", "/PublicKey<"), "wst:InvalidRequest",
                         "a holder-of-key token is asked for without proof of a key"));
 }
 
@@ -180,11 +180,12 @@ TEST_F(Malformed, EveryTruncation) {
 }
 
 TEST_F(Malformed, UnboundPrefix) {
-  EXPECT_TRUE(IsRefused(SendSpoilt("<wst:TokenType>", "<wst:TokenType x:y=\"\">"), "soapenv:Client", NOT_WELL_FORMED));
+  EXPECT_TRUE(
+      IsRefused(SendCorrupted("<wst:TokenType>", "<wst:TokenType x:y=\"\">"), "soapenv:Client", NOT_WELL_FORMED));
 }
 
 TEST_F(Malformed, UndefinedEntity) {
-  EXPECT_TRUE(IsRefused(SendSpoilt("wonderland", "&wonderland;"), "soapenv:Client", NOT_WELL_FORMED));
+  EXPECT_TRUE(IsRefused(SendCorrupted("wonderland", "&wonderland;"), "soapenv:Client", NOT_WELL_FORMED));
 }
 
 TEST_F(Malformed, DocumentTypeDeclaration) {
@@ -217,7 +218,7 @@ TEST_F(Malformed, NotAnEnvelope) {
 
 TEST_F(Malformed, EnvelopeOfSoap12) {
   EXPECT_TRUE(
-      IsRefused(SendSpoilt("http://schemas.xmlsoap.org/soap/envelope/", "http://www.w3.org/2003/05/soap-envelope"),
+      IsRefused(SendCorrupted("http://schemas.xmlsoap.org/soap/envelope/", "http://www.w3.org/2003/05/soap-envelope"),
                 "soapenv:Client", "not a SOAP 1.1 envelope"));
 }
 
@@ -233,12 +234,12 @@ TEST_F(Malformed, EmptyBody) {
 }
 
 TEST_F(Malformed, UnknownRequestType) {
-  EXPECT_TRUE(IsRefused(SendSpoilt("/Issue<", "/Cancel<"), "wst:InvalidRequest",
+  EXPECT_TRUE(IsRefused(SendCorrupted("/Issue<", "/Cancel<"), "wst:InvalidRequest",
                         std::string("unsupported request type '") + WST + "/Cancel'"));
 }
 
 TEST_F(Malformed, UnknownKeyType) {
-  EXPECT_TRUE(IsRefused(SendSpoilt("/Bearer<", "/SymmetricKey<"), "wst:InvalidRequest",
+  EXPECT_TRUE(IsRefused(SendCorrupted("/Bearer<", "/SymmetricKey<"), "wst:InvalidRequest",
                         std::string("unsupported key type '") + WST + "/SymmetricKey'"));
 }
 
@@ -250,12 +251,12 @@ TEST_F(Malformed, ActionOfAnotherOperation) {
 }
 
 TEST_F(Malformed, CommentThatSplitsAText) {
-  EXPECT_TRUE(IsRefused(SendSpoilt("alice@corp.example", "alice@corp.example<!-- -->.evil"), "wst:InvalidRequest",
+  EXPECT_TRUE(IsRefused(SendCorrupted("alice@corp.example", "alice@corp.example<!-- -->.evil"), "wst:InvalidRequest",
                         "Username must hold text alone"));
 }
 
 TEST_F(Malformed, ElementThatStandsTwice) {
-  EXPECT_TRUE(IsRefused(SendSpoilt("<wst:Delegatable>", "<wst:Delegatable>true</wst:Delegatable><wst:Delegatable>"),
+  EXPECT_TRUE(IsRefused(SendCorrupted("<wst:Delegatable>", "<wst:Delegatable>true</wst:Delegatable><wst:Delegatable>"),
                         "wst:InvalidRequest", "several wst:Delegatable"));
 }
 

@@ -252,7 +252,7 @@ int CountFindsOfPosts(const char *secret, const Testing::ScriptedServer::Script 
 
 TEST_P(FreedMemory, HoldsNoPasswordOfARequestThatWasSent) {
   const auto answer = [](Testing::ServerConnection &connection) {
-    connection.ShakeHands();
+    connection.Handshake();
     connection.Write(Testing::Response("200 OK", "<answer/>"));
     connection.WaitForInterrupt();
   };
@@ -263,7 +263,7 @@ TEST_P(FreedMemory, HoldsNoPasswordOfARequestThatWasSent) {
 TEST_P(FreedMemory, HoldsNoPasswordOfARequestThatFailed) {
   constexpr std::int64_t SHORT = 200000; // microseconds
   const auto stall = [](Testing::ServerConnection &connection) {
-    connection.ShakeHands();
+    connection.Handshake();
     connection.WaitForInterrupt();
   };
   const auto reset = [](Testing::ServerConnection &connection) { connection.Reset(); };
@@ -279,7 +279,7 @@ enum class Reading { NOT, IN_PIECES, WHOLE, AS_XML };
 int CountFindsOfAnswers(const char *secret, const std::vector<std::string> &pieces,
                         const std::optional<Testing::TlsSettings> &tls, Reading reading) {
   const auto script = [&pieces](Testing::ServerConnection &connection) {
-    connection.ShakeHands();
+    connection.Handshake();
     connection.ReadRequest();
     for (const std::string &piece : pieces) {
       connection.Write(piece);

@@ -24,7 +24,7 @@ using Testing::TlsSettings;
 
 /// Says what the server thinks of the handshake.
 void TellWhetherResumed(ServerConnection &connection) {
-  if (connection.ShakeHands()) {
+  if (connection.Handshake()) {
     connection.Write(connection.WasResumed() ? "resumed" : "full");
     connection.ReadSome();
   }
@@ -41,7 +41,7 @@ protected:
   /// "full" or "resumed", on which both sides must agree, or the message of what went wrong.
   std::string Connect(const std::string &host = "localhost", const std::string &parameter = "") {
     TlsClient client(m_context, m_server.GetPort());
-    if (const std::string failure = client.ShakeHands(host, parameter); !failure.empty()) {
+    if (const std::string failure = client.Handshake(host, parameter); !failure.empty()) {
       return failure;
     }
     std::string told = client.Read();
@@ -66,7 +66,7 @@ TEST_P(SessionResumption, TheSecondConnectionAndAllLaterOnesAreResumed) {
 TEST_P(SessionResumption, ASessionIsResumedThoughItsConnectionWasOnlyDropped) {
   {
     TlsClient client(m_context, m_server.GetPort());
-    ASSERT_EQ(client.ShakeHands(), "");
+    ASSERT_EQ(client.Handshake(), "");
     ASSERT_EQ(client.Read(), "full");
   }
   EXPECT_TRUE(Testing::Eventually([this] { return CountSessions() > 0; })); // an I/O thread may hold the stream a bit
@@ -76,30 +76,30 @@ TEST_P(SessionResumption, ASessionIsResumedThoughItsConnectionWasOnlyDropped) {
 // OpenSSL changes and copies the session of a living connection without a lock.
 TEST_P(SessionResumption, ASessionIsResumedOnlyOnceItsConnectionHasEnded) {
   TlsClient first(m_context, m_server.GetPort());
-  ASSERT_EQ(first.ShakeHands(), "");
+  ASSERT_EQ(first.Handshake(), "");
   ASSERT_EQ(first.Read(), "full");
   TlsClient second(m_context, m_server.GetPort());
-  ASSERT_EQ(second.ShakeHands(), "");
+  ASSERT_EQ(second.Handshake(), "");
   EXPECT_EQ(second.Read(), "full");
   EXPECT_EQ(CountSessions(), 0u);
   first.GetStream()->Close();
   EXPECT_GT(CountSessions(), 0u);
   TlsClient third(m_context, m_server.GetPort());
-  ASSERT_EQ(third.ShakeHands(), "");
+  ASSERT_EQ(third.Handshake(), "");
   EXPECT_EQ(third.Read(), "resumed");
 }
 
 TEST_P(SessionResumption, NoSessionIsResumedAfterAFatalAlert) {
   ScriptedServer garbling(
       [](ServerConnection &connection) {
-        if (connection.ShakeHands() && connection.Write("full")) {
+        if (connection.Handshake() && connection.Write("full")) {
           connection.WriteRaw(std::string("\x17\x03\x03\x00\x20", 5) + std::string(32, 'x'));
           connection.ReadSome();
         }
       },
       Settings());
   TlsClient client(m_context, garbling.GetPort());
-  ASSERT_EQ(client.ShakeHands(), "");
+  ASSERT_EQ(client.Handshake(), "");
   ASSERT_EQ(client.Read(), "full");
   client.Read();
   EXPECT_TRUE(client.HasFailed());
@@ -136,7 +136,7 @@ TEST_P(SessionResumption, EveryThumbprintHasSessionsOfItsOwn) {
 TEST_P(SessionResumption, AnotherContextKnowsNothingOfThem) {
   EXPECT_EQ(Connect(), "full");
   TlsClient client(CreateTrustingContext(), m_server.GetPort());
-  EXPECT_EQ(client.ShakeHands(), "");
+  EXPECT_EQ(client.Handshake(), "");
   EXPECT_EQ(client.Read(), "full");
 }
 
@@ -152,7 +152,7 @@ TEST_P(SessionResumption, AServerThatForgotGetsAFullHandshake) {
   ScriptedServer forgetful(TellWhetherResumed, settings);
   for (int i = 0; i < 3; ++i) {
     TlsClient client(m_context, forgetful.GetPort());
-    EXPECT_EQ(client.ShakeHands(), "");
+    EXPECT_EQ(client.Handshake(), "");
     EXPECT_EQ(client.Read(), "full");
     client.GetStream()->Close();
   }
@@ -167,7 +167,7 @@ TEST(SessionsOfOneConnection, AreBounded) {
   ScriptedServer server(TellWhetherResumed, settings);
   const Ref<SSLContext> context = CreateTrustingContext();
   TlsClient client(context, server.GetPort());
-  ASSERT_EQ(client.ShakeHands(), "");
+  ASSERT_EQ(client.Handshake(), "");
   EXPECT_EQ(client.Read(), "full");
   client.GetStream()->Close();
   EXPECT_EQ(dynamic_cast<SSLContextImpl &>(*context).GetSessions().GetSize(), 8u);

@@ -35,7 +35,7 @@ using Testing::TlsClient;
 using Testing::TlsSettings;
 
 void Echo(ServerConnection &connection) {
-  if (!connection.ShakeHands()) {
+  if (!connection.Handshake()) {
     return;
   }
   for (std::string some = connection.ReadSome(); !some.empty(); some = connection.ReadSome()) {
@@ -49,7 +49,7 @@ TEST(SSLStream, ExchangesBytesOverEachAllowedVersion) {
     settings.minimumVersion = settings.maximumVersion = version;
     ScriptedServer server(Echo, settings);
     TlsClient client(CreateTrustingContext(), server.GetPort());
-    ASSERT_EQ(client.ShakeHands(), "") << version;
+    ASSERT_EQ(client.Handshake(), "") << version;
     EXPECT_EQ(client.Write("hello"), "");
     EXPECT_EQ(client.Read(), "hello");
     EXPECT_FALSE(client.GetStream()->WasResumed());
@@ -61,15 +61,15 @@ TEST(SSLStream, SendsTheServerNameButNoAddress) {
   int next = 0;
   ScriptedServer server(
       [&](ServerConnection &connection) {
-        connection.ShakeHands();
+        connection.Handshake();
         names[next++].set_value(connection.GetServerName());
       },
       TlsSettings());
   TlsClient byName(CreateTrustingContext(), server.GetPort());
-  EXPECT_EQ(byName.ShakeHands("LocalHost."), "");
+  EXPECT_EQ(byName.Handshake("LocalHost."), "");
   EXPECT_EQ(names[0].get_future().get(), "localhost");
   TlsClient byAddress(CreateTrustingContext(), server.GetPort());
-  EXPECT_EQ(byAddress.ShakeHands("127.0.0.1"), "");
+  EXPECT_EQ(byAddress.Handshake("127.0.0.1"), "");
   EXPECT_EQ(names[1].get_future().get(), "");
 }
 
@@ -77,10 +77,10 @@ TEST(SSLStream, ChecksAddressesAgainstTheCertificate) {
   ScriptedServer server(Echo, TlsSettings());
   for (const char *host : {"127.0.0.1", "::1", "[::1]", "::1%lo"}) {
     TlsClient client(CreateTrustingContext(), server.GetPort());
-    EXPECT_EQ(client.ShakeHands(host), "") << host;
+    EXPECT_EQ(client.Handshake(host), "") << host;
   }
   TlsClient client(CreateTrustingContext(), server.GetPort());
-  EXPECT_EQ(client.ShakeHands("127.0.0.2"),
+  EXPECT_EQ(client.Handshake("127.0.0.2"),
             "The TLS handshake with 127.0.0.2 failed: the server's certificate was not accepted: IP address mismatch "
             "(certificate \"CN=localhost\")");
 }
@@ -88,12 +88,12 @@ TEST(SSLStream, ChecksAddressesAgainstTheCertificate) {
 TEST(SSLStream, MovesLargeMessagesBothWays) {
   ScriptedServer server(
       [](ServerConnection &connection) {
-        connection.ShakeHands();
+        connection.Handshake();
         connection.Write(connection.ReadExactly(4u << 20));
       },
       TlsSettings());
   TlsClient client(CreateTrustingContext(), server.GetPort());
-  ASSERT_EQ(client.ShakeHands(), "");
+  ASSERT_EQ(client.Handshake(), "");
   std::string message(4u << 20, '\0');
   for (std::size_t i = 0; i < message.size(); ++i) {
     message[i] = static_cast<char>(i * 31 + i / 4096);
@@ -111,12 +111,12 @@ TEST(SSLStream, MovesLargeMessagesBothWays) {
 TEST(SSLStream, ReadsTheClosingNoticeAsTheOrderlyEnd) {
   ScriptedServer server(
       [](ServerConnection &connection) {
-        connection.ShakeHands();
+        connection.Handshake();
         connection.Write("bye");
       },
       TlsSettings());
   TlsClient client(CreateTrustingContext(), server.GetPort());
-  ASSERT_EQ(client.ShakeHands(), "");
+  ASSERT_EQ(client.Handshake(), "");
   EXPECT_EQ(client.Read(), "bye");
   EXPECT_EQ(client.Read(), "");
   EXPECT_FALSE(client.HasFailed());
@@ -127,13 +127,13 @@ TEST(SSLStream, ReadsTheClosingNoticeAsTheOrderlyEnd) {
 TEST(SSLStream, AnEndWithoutClosingNoticeIsAFailure) {
   ScriptedServer server(
       [](ServerConnection &connection) {
-        connection.ShakeHands();
+        connection.Handshake();
         connection.Write("half");
         connection.CloseWithoutNotice();
       },
       TlsSettings());
   TlsClient client(CreateTrustingContext(), server.GetPort());
-  ASSERT_EQ(client.ShakeHands(), "");
+  ASSERT_EQ(client.Handshake(), "");
   EXPECT_EQ(client.Read(), "half");
   const std::string failure =
       "The TLS connection to localhost broke: the server ended the connection without TLS's closing notice";
@@ -147,14 +147,14 @@ TEST(SSLStream, ClosingSendsTheClosingNotice) {
   std::promise<bool> noticed;
   ScriptedServer server(
       [&](ServerConnection &connection) {
-        connection.ShakeHands();
+        connection.Handshake();
         connection.Write("x");
         connection.ReadSome();
         noticed.set_value(connection.ReceivedClosingNotice());
       },
       TlsSettings());
   TlsClient client(CreateTrustingContext(), server.GetPort());
-  ASSERT_EQ(client.ShakeHands(), "");
+  ASSERT_EQ(client.Handshake(), "");
   EXPECT_EQ(client.Read(), "x"); // what lies unread at the end would make the kernel send a reset
   client.GetStream()->Close();
   EXPECT_TRUE(noticed.get_future().get());
@@ -171,7 +171,7 @@ TEST(SSLStream, ReportsAResetBeforeTheHandshake) {
   TlsClient client(CreateTrustingContext(), server.GetPort());
   connected.set_value();
   // The kernel tells a reset once: if the write meets it, the read that runs beside it sees an end.
-  const std::string message = client.ShakeHands();
+  const std::string message = client.Handshake();
   EXPECT_EQ(message.rfind("The TLS handshake with localhost failed: ", 0), 0u) << message;
   EXPECT_TRUE(client.FailedInHandshake());
 }
@@ -185,14 +185,14 @@ TEST(SSLStream, ReportsAResetWithinTheHandshake) {
       },
       TlsSettings());
   TlsClient client(CreateTrustingContext(), server.GetPort());
-  EXPECT_EQ(client.ShakeHands(), "The TLS handshake with localhost failed: The connection to 127.0.0.1:" +
-                                     std::to_string(server.GetPort()) + " broke: Connection reset by peer");
+  EXPECT_EQ(client.Handshake(), "The TLS handshake with localhost failed: The connection to 127.0.0.1:" +
+                                    std::to_string(server.GetPort()) + " broke: Connection reset by peer");
 }
 
 TEST(SSLStream, ReportsAnEndWithinTheHandshake) {
   ScriptedServer server([](ServerConnection &connection) { connection.ReadRawSome(); }, TlsSettings());
   TlsClient client(CreateTrustingContext(), server.GetPort());
-  EXPECT_EQ(client.ShakeHands(),
+  EXPECT_EQ(client.Handshake(),
             "The TLS handshake with localhost failed: the server ended the connection without TLS's "
             "closing notice");
 }
@@ -204,7 +204,7 @@ TEST(SSLStream, ReportsAnOrderlyEndWithinTheHandshake) {
     connection.Stall();
   });
   TlsClient client(CreateTrustingContext(), server.GetPort());
-  EXPECT_EQ(client.ShakeHands(), "The TLS handshake with localhost failed: the server ended the connection");
+  EXPECT_EQ(client.Handshake(), "The TLS handshake with localhost failed: the server ended the connection");
 }
 
 /// A stream over TCP whose writes fail once they are told to, as when the server has reset the connection.
@@ -311,7 +311,7 @@ TEST(SSLStream, ReadsWhatTheServerSentAfterAWriteHasFailed) {
   std::promise<void> failed;
   ScriptedServer server(
       [future = failed.get_future().share()](ServerConnection &connection) {
-        connection.ShakeHands();
+        connection.Handshake();
         future.wait_for(PATIENCE);
         connection.Write("413");
       },
@@ -329,7 +329,7 @@ TEST(SSLStream, ReportsTheFailedWriteWhenTheServerEndsWithoutNotice) {
   std::promise<void> failed;
   ScriptedServer server(
       [future = failed.get_future().share()](ServerConnection &connection) {
-        connection.ShakeHands();
+        connection.Handshake();
         future.wait_for(PATIENCE);
         connection.CloseWithoutNotice();
       },
@@ -361,7 +361,7 @@ TEST(SSLStream, ReportsThatACertificateIsRequired) {
   TlsSettings settings;
   settings.demandsClient = true;
   settings.minimumVersion = TLS1_3_VERSION;
-  ScriptedServer server([](ServerConnection &connection) { connection.ShakeHands(); }, settings);
+  ScriptedServer server([](ServerConnection &connection) { connection.Handshake(); }, settings);
   const BrokenConnection client(server.GetPort(), false);
   EXPECT_EQ(client.handshake.GetMessage(), "");
   EXPECT_EQ(client.Write("request"), "The TLS connection to localhost broke: Broken pipe");
@@ -376,7 +376,7 @@ TEST(SSLStream, ReportsAServerThatDoesNotSpeakTls) {
     connection.Stall();
   });
   TlsClient client(CreateTrustingContext(), server.GetPort());
-  EXPECT_EQ(client.ShakeHands(),
+  EXPECT_EQ(client.Handshake(),
             "The TLS handshake with localhost failed: error:0A00010B:SSL routines::wrong version number");
 }
 
@@ -387,7 +387,7 @@ TEST(SSLStream, RefusesAServerThatOffersOnlyOldTls) {
   settings.allowsWeakness = true;
   ScriptedServer server(Echo, settings);
   TlsClient client(CreateTrustingContext(), server.GetPort());
-  const std::string message = client.ShakeHands();
+  const std::string message = client.Handshake();
   EXPECT_EQ(message.rfind("The TLS handshake with localhost failed: error:", 0), 0u) << message;
   EXPECT_NE(message.find("alert protocol version"), std::string::npos) << message;
 }
@@ -395,13 +395,13 @@ TEST(SSLStream, RefusesAServerThatOffersOnlyOldTls) {
 TEST(SSLStream, ABrokenRecordIsAFailure) {
   ScriptedServer server(
       [](ServerConnection &connection) {
-        connection.ShakeHands();
+        connection.Handshake();
         connection.WriteRaw(std::string("\x17\x03\x03\x00\x20", 5) + std::string(32, 'x'));
         connection.Stall();
       },
       TlsSettings());
   TlsClient client(CreateTrustingContext(), server.GetPort());
-  ASSERT_EQ(client.ShakeHands(), "");
+  ASSERT_EQ(client.Handshake(), "");
   const std::string message = client.Read();
   EXPECT_EQ(message.rfind("The TLS connection to localhost broke: error:", 0), 0u) << message;
 }
@@ -422,12 +422,12 @@ TEST(SSLStream, ClosingEndsAHandshakeThatStalls) {
 TEST(SSLStream, ClosingEndsPendingReadsAndWritesOnce) {
   ScriptedServer server(
       [](ServerConnection &connection) {
-        connection.ShakeHands();
+        connection.Handshake();
         connection.WaitForInterrupt();
       },
       TlsSettings());
   TlsClient client(CreateTrustingContext(), server.GetPort());
-  ASSERT_EQ(client.ShakeHands(), "");
+  ASSERT_EQ(client.Handshake(), "");
   char buffer[16];
   const std::string message(64u << 20, 'x');
   Completion read;
@@ -476,8 +476,8 @@ TEST(SSLStream, OperationsBeforeTheHandshakeFail) {
   TlsClient client(CreateTrustingContext(), server.GetPort());
   EXPECT_EQ(client.Read(), "The TLS handshake has not been started");
   EXPECT_EQ(client.Write("x"), "The TLS handshake has not been started");
-  EXPECT_EQ(client.ShakeHands(), "");
-  EXPECT_EQ(client.ShakeHands(), "The TLS handshake was started before");
+  EXPECT_EQ(client.Handshake(), "");
+  EXPECT_EQ(client.Handshake(), "The TLS handshake was started before");
   EXPECT_EQ(client.Write("x"), "");
   EXPECT_EQ(client.Read(), "x");
 }
@@ -485,12 +485,12 @@ TEST(SSLStream, OperationsBeforeTheHandshakeFail) {
 TEST(SSLStream, ASecondReadOrWriteAtTheSameTimeIsRefused) {
   ScriptedServer server(
       [](ServerConnection &connection) {
-        connection.ShakeHands();
+        connection.Handshake();
         connection.WaitForInterrupt();
       },
       TlsSettings());
   TlsClient client(CreateTrustingContext(), server.GetPort());
-  ASSERT_EQ(client.ShakeHands(), "");
+  ASSERT_EQ(client.Handshake(), "");
   char buffer[2];
   Completion first;
   Completion second;
@@ -509,12 +509,12 @@ TEST(SSLStream, TheHostsErrorQueueIsNeitherReadNorChanged) {
   const unsigned long left = ERR_peek_error();
   {
     TlsClient client(CreateTrustingContext(), server.GetPort());
-    EXPECT_EQ(client.ShakeHands(), "");
+    EXPECT_EQ(client.Handshake(), "");
     EXPECT_EQ(client.Write("hello"), "");
     EXPECT_EQ(client.Read(), "hello");
     client.GetStream()->Close();
     TlsClient refused(CreateTrustingContext(), server.GetPort());
-    EXPECT_NE(refused.ShakeHands("other.example"), "");
+    EXPECT_NE(refused.Handshake("other.example"), "");
   }
   EXPECT_EQ(ERR_get_error(), left);
   EXPECT_EQ(ERR_get_error(), 0u);
@@ -529,7 +529,7 @@ TEST(SSLStream, ManyConnectionsAtOnce) {
     threads.emplace_back([&] {
       for (int i = 0; i < 10; ++i) {
         TlsClient client(context, server.GetPort());
-        right += client.ShakeHands().empty() && client.Write("hello").empty() && client.Read() == "hello";
+        right += client.Handshake().empty() && client.Write("hello").empty() && client.Read() == "hello";
         client.GetStream()->Close();
       }
     });
@@ -552,7 +552,7 @@ void EndWhileBusy() {
     std::thread([context, port = server->GetPort()] {
       for (;; ++attempts) {
         try {
-          TlsClient(context, port).ShakeHands();
+          TlsClient(context, port).Handshake();
         } catch (const std::exception &) {
           // The server resets connections at will.
         }

@@ -29,7 +29,7 @@ using Testing::TlsSettings;
 constexpr int VERSIONS[] = {TLS1_2_VERSION, TLS1_3_VERSION};
 
 void Answer(ServerConnection &connection) {
-  if (connection.ShakeHands()) {
+  if (connection.Handshake()) {
     connection.Write(connection.GetClientName() + "!");
     connection.ReadSome();
   }
@@ -43,11 +43,11 @@ TlsSettings Settings(const std::string &certificate, int version = 0) {
 }
 
 /// The outcome of a handshake with a server that shows `certificate`.
-std::string ShakeHands(const Ref<SSLContext> &context, const std::string &certificate, const std::string &host,
-                       const std::string &parameter = "", int version = 0) {
+std::string Handshake(const Ref<SSLContext> &context, const std::string &certificate, const std::string &host,
+                      const std::string &parameter = "", int version = 0) {
   ScriptedServer server(Answer, Settings(certificate, version));
   TlsClient client(context, server.GetPort());
-  const std::string message = client.ShakeHands(host, parameter);
+  const std::string message = client.Handshake(host, parameter);
   EXPECT_EQ(client.FailedInHandshake(), !message.empty());
   client.GetStream()->Close();
   return message;
@@ -65,7 +65,7 @@ TEST(SSLContext, EachReasonAgainstACertificateIsTold) {
                                              {"other-host", "hostname mismatch"},
                                              {"untrusted", "unable to get local issuer certificate"},
                                              {"not-for-servers", "unsuitable certificate purpose"}}) {
-      EXPECT_EQ(ShakeHands(CreateTrustingContext(), bad.certificate, "localhost", "", version),
+      EXPECT_EQ(Handshake(CreateTrustingContext(), bad.certificate, "localhost", "", version),
                 "The TLS handshake with localhost failed: the server's certificate was not accepted: " + bad.reason +
                     " (certificate \"CN=" + bad.certificate + "\")");
     }
@@ -73,7 +73,7 @@ TEST(SSLContext, EachReasonAgainstACertificateIsTold) {
 }
 
 TEST(SSLContext, TrustsNothingAtFirst) {
-  EXPECT_EQ(ShakeHands(CreateSSLContext(), "localhost", "localhost"),
+  EXPECT_EQ(Handshake(CreateSSLContext(), "localhost", "localhost"),
             "The TLS handshake with localhost failed: the server's certificate was not accepted: unable to get local "
             "issuer certificate (certificate \"CN=localhost\")");
 }
@@ -81,16 +81,16 @@ TEST(SSLContext, TrustsNothingAtFirst) {
 TEST(SSLContext, TrustsCertificatesFromMemory) {
   const Ref<SSLContext> context = CreateSSLContext();
   context->TrustCertificates({TlsCertificate("authority"), TlsCertificate("authority")});
-  EXPECT_EQ(ShakeHands(context, "localhost", "localhost"), "");
+  EXPECT_EQ(Handshake(context, "localhost", "localhost"), "");
 }
 
 TEST(SSLContext, TrustsAServersOwnCertificate) {
   const Ref<SSLContext> context = CreateSSLContext();
   context->TrustCertificates(
       {TlsCertificate("localhost"), TlsCertificate("self-signed"), TlsCertificate("other-host")});
-  EXPECT_EQ(ShakeHands(context, "localhost", "localhost"), "");
-  EXPECT_EQ(ShakeHands(context, "self-signed", "localhost"), "");
-  EXPECT_NE(ShakeHands(context, "other-host", "localhost"), "");
+  EXPECT_EQ(Handshake(context, "localhost", "localhost"), "");
+  EXPECT_EQ(Handshake(context, "self-signed", "localhost"), "");
+  EXPECT_NE(Handshake(context, "other-host", "localhost"), "");
 }
 
 TEST(SSLContext, TheSystemStoreTrustsNoneOfOurs) {
@@ -100,7 +100,7 @@ TEST(SSLContext, TheSystemStoreTrustsNoneOfOurs) {
   } catch (const Crypto::CryptoException &exception) {
     EXPECT_EQ(std::string(exception.what()).rfind("There is no system trust store at ", 0), 0u) << exception.what();
   }
-  EXPECT_NE(ShakeHands(context, "localhost", "localhost"), "");
+  EXPECT_NE(Handshake(context, "localhost", "localhost"), "");
 }
 
 TEST(SSLContext, AFileWithoutCertificatesIsRefused) {
@@ -110,11 +110,11 @@ TEST(SSLContext, AFileWithoutCertificatesIsRefused) {
 
 TEST(SSLContext, AHostNameIsNeeded) {
   for (const char *host : {"", "."}) {
-    EXPECT_EQ(ShakeHands(CreateTrustingContext(), "localhost", host),
+    EXPECT_EQ(Handshake(CreateTrustingContext(), "localhost", host),
               "The TLS handshake with " + std::string(host) +
                   " failed: there is no host name to check the server's certificate against");
   }
-  EXPECT_EQ(ShakeHands(CreateTrustingContext(), "localhost", "local\xC3\xA9"),
+  EXPECT_EQ(Handshake(CreateTrustingContext(), "localhost", "local\xC3\xA9"),
             "The TLS handshake with local\xC3\xA9 failed: the host name holds a character that is not printable ASCII");
 }
 
@@ -122,7 +122,7 @@ TEST(SSLContext, ARightThumbprintStandsInForChainAndName) {
   for (const int version : VERSIONS) {
     for (const char *certificate : {"localhost", "self-signed", "expired", "other-host", "untrusted"}) {
       const std::string digits = TlsCertificate(certificate)->GetSha256Thumbprint();
-      EXPECT_EQ(ShakeHands(CreateSSLContext(), certificate, "elsewhere.example", digits, version), "") << certificate;
+      EXPECT_EQ(Handshake(CreateSSLContext(), certificate, "elsewhere.example", digits, version), "") << certificate;
     }
   }
 }
@@ -136,14 +136,14 @@ TEST(SSLContext, AThumbprintMayHaveColonsAndAnyCase) {
   for (std::size_t i = 0; i < upper.size(); i += 2) {
     colons += (colons.empty() ? "" : ":") + upper.substr(i, 2);
   }
-  EXPECT_EQ(ShakeHands(CreateSSLContext(), "localhost", "localhost", upper), "");
-  EXPECT_EQ(ShakeHands(CreateSSLContext(), "localhost", "localhost", colons), "");
+  EXPECT_EQ(Handshake(CreateSSLContext(), "localhost", "localhost", upper), "");
+  EXPECT_EQ(Handshake(CreateSSLContext(), "localhost", "localhost", colons), "");
 }
 
 TEST(SSLContext, AWrongThumbprintIsRefusedWhateverTheChainSays) {
   const std::string wanted = TlsCertificate("other-host")->GetSha256Thumbprint();
   for (const int version : VERSIONS) {
-    EXPECT_EQ(ShakeHands(CreateTrustingContext(), "localhost", "localhost", wanted, version),
+    EXPECT_EQ(Handshake(CreateTrustingContext(), "localhost", "localhost", wanted, version),
               "The TLS handshake with localhost failed: the server's certificate has the SHA-256 thumbprint " +
                   TlsCertificate("localhost")->GetSha256Thumbprint() + " instead of " + wanted);
   }
@@ -155,7 +155,7 @@ TEST(SSLContext, AParameterThatIsNoThumbprintIsRefused) {
   wrongDigit[10] = 'g';
   for (const std::string &bad : {std::string("x"), digits.substr(1), digits + "0", digits + ":", " " + digits.substr(1),
                                  wrongDigit, digits.substr(0, 40), std::string(64, ':'), std::string(95, 'a')}) {
-    EXPECT_EQ(ShakeHands(CreateTrustingContext(), "localhost", "localhost", bad),
+    EXPECT_EQ(Handshake(CreateTrustingContext(), "localhost", "localhost", bad),
               "The TLS handshake with localhost failed: the SSL parameter \"" + bad +
                   "\" is not a SHA-256 thumbprint of 64 hexadecimal digits");
   }
@@ -170,7 +170,7 @@ TEST(SSLContext, ShowsTheClientCertificateWithItsIntermediates) {
     context->SetClientCertificate(TlsCertificate("client"), Crypto::LoadPrivateKey(TlsPath("client.key")),
                                   {TlsCertificate("intermediate")});
     TlsClient client(context, server.GetPort());
-    EXPECT_EQ(client.ShakeHands(), "");
+    EXPECT_EQ(client.Handshake(), "");
     EXPECT_EQ(client.Read(), "client!");
     client.GetStream()->Close();
   }
@@ -183,7 +183,7 @@ TEST(SSLContext, ReportsThatAClientCertificateIsDemanded) {
     ScriptedServer server(Answer, settings);
     TlsClient client(CreateTrustingContext(), server.GetPort());
     // With TLS 1.3 the client's handshake is over before the server looks at the certificate.
-    const std::string handshake = client.ShakeHands();
+    const std::string handshake = client.Handshake();
     const std::string message = version == TLS1_2_VERSION ? handshake : client.Read();
     EXPECT_EQ(message, version == TLS1_2_VERSION
                            ? "The TLS handshake with localhost failed: error:0A000410:SSL routines::sslv3 alert "

@@ -46,7 +46,7 @@ public:
   TlsClient(const TlsClient &) = delete;
   TlsClient &operator=(const TlsClient &) = delete;
 
-  std::string ShakeHands(const std::string &host = "localhost", const std::string &parameter = "") {
+  std::string Handshake(const std::string &host = "localhost", const std::string &parameter = "") {
     m_handshake = Completion();
     m_stream->AsyncHandshake(host, parameter, m_handshake.ForEnd());
     return m_handshake.GetMessage();
