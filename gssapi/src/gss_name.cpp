@@ -20,7 +20,7 @@ void ImportName(const std::string &text, gss_const_OID form, NameHandle &name) {
   status.major = gss_import_name(&status.minor, &buffer, &writableForm, name.Slot());
   if (status.IsError()) {
     throw Tarvel::InvalidArgumentException("'" + Tarvel::StringUtil::Shorten(text) +
-                                           "' is no name: " + DescribeStatus(status, GSS_C_NO_OID));
+                                           "' is not a valid name: " + DescribeStatus(status, GSS_C_NO_OID));
   }
 }
 
@@ -29,7 +29,7 @@ void ImportServiceName(const std::string &service, NameHandle &name) {
   const std::size_t separator = service.find(isPrincipal ? '/' : '@');
   if (separator == 0 || separator == std::string::npos || separator + 1 == service.size()) {
     throw Tarvel::InvalidArgumentException("'" + Tarvel::StringUtil::Shorten(service) +
-                                           "' is no service, as HTTP@host or HTTP/host@REALM");
+                                           "' is not a service name such as HTTP@host or HTTP/host@REALM");
   }
   ImportName(service, isPrincipal ? GSS_KRB5_NT_PRINCIPAL_NAME : GSS_C_NT_HOSTBASED_SERVICE, name);
 }

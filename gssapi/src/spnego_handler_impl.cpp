@@ -106,7 +106,7 @@ void SpnegoHandlerImpl::CheckServiceLeg(const std::vector<std::uint8_t> &service
     }
     return;
   case State::FAILED:
-    throw Tarvel::InvalidStateException("The negotiation with " + m_settings.service + " has failed before");
+    throw Tarvel::InvalidStateException("The negotiation with " + m_settings.service + " has already failed");
   }
 }
 
@@ -138,7 +138,7 @@ std::vector<std::uint8_t> SpnegoHandlerImpl::AdvanceContext(const std::vector<st
 void SpnegoHandlerImpl::CompleteWith(OM_uint32 contextFlags) {
   if ((contextFlags & GSS_C_MUTUAL_FLAG) == 0) {
     throw GssNegotiationException("The service " + m_settings.service +
-                                  " was not authenticated: the mechanism did without");
+                                  " was not authenticated: the mechanism does not support it");
   }
   m_state = State::COMPLETE;
 }

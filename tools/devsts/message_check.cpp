@@ -81,7 +81,7 @@ Envelope ReadEnvelope(const xmlDoc &document) {
 Time ReadTime(const xmlNode &timestamp, const char *name) {
   const std::optional<Time> time = ParseTime(TextOf(RequireChild(timestamp, Ns::WSU, name)));
   if (!time) {
-    RefuseSecurity(std::string(name) + " of the timestamp is no UTC date");
+    RefuseSecurity(std::string(name) + " of the timestamp is not a UTC date");
   }
   return *time;
 }
@@ -94,7 +94,7 @@ void CheckTimestamp(const xmlNode &timestamp, std::chrono::seconds tolerance) {
     RefuseSecurity("the timestamp's period is empty or too long");
   }
   if (created > now + tolerance) {
-    RefuseSecurity("the timestamp lies in the future");
+    RefuseSecurity("the timestamp is in the future");
   }
   if (expires + tolerance <= now) {
     throw Refusal(Code::MESSAGE_EXPIRED, "the message has expired");
@@ -115,7 +115,7 @@ void RequireCoverage(const Envelope &envelope, const Identifiers &identifiers) {
   for (const SignatureReference &reference : ReadReferences(*envelope.security.signature)) {
     const auto found = identifiers.find(reference.id);
     if (reference.isEnveloped || found == identifiers.end()) {
-      RefuseSecurity("the signature refers to what is not there");
+      RefuseSecurity("the signature refers to an element that does not exist");
     }
     covered.push_back(found->second);
   }
@@ -132,7 +132,7 @@ Certificate BinaryTokenCertificate(const Envelope &envelope, const Identifiers &
   const std::string uri = AttributeOf(reference, "URI").value_or("");
   const auto found = identifiers.find(uri.substr(uri.empty() ? 0 : 1));
   if (!token || uri.rfind('#', 0) != 0 || found == identifiers.end() || found->second != token) {
-    throw Refusal(Code::TOKEN_UNAVAILABLE, "the signature's key reference points at no binary security token");
+    throw Refusal(Code::TOKEN_UNAVAILABLE, "the signature's key reference does not refer to a binary security token");
   }
   if (AttributeOf(*token, "ValueType").value_or("") != X509_VALUE_TYPE ||
       AttributeOf(*token, "EncodingType").value_or(BASE64_ENCODING) != BASE64_ENCODING) {
@@ -145,10 +145,10 @@ Certificate BinaryTokenCertificate(const Envelope &envelope, const Identifiers &
 Certificate HolderCertificate(const Envelope &envelope, const CheckedMessage &message, const xmlNode &keyIdentifier) {
   if (!message.presentedToken || AttributeOf(keyIdentifier, "ValueType").value_or("") != SAML_ID_VALUE_TYPE ||
       TextOf(keyIdentifier) != AttributeOf(*envelope.security.assertion, "ID")) {
-    throw Refusal(Code::TOKEN_UNAVAILABLE, "the signature's key reference names no token of the message");
+    throw Refusal(Code::TOKEN_UNAVAILABLE, "the signature's key reference does not refer to a token of the message");
   }
   if (message.presentedToken->certificate.empty()) {
-    throw Refusal(Code::TOKEN_UNAVAILABLE, "a bearer token names no key that could have signed the message");
+    throw Refusal(Code::TOKEN_UNAVAILABLE, "a bearer token has no key that could have signed the message");
   }
   return DecodeCertificate(message.presentedToken->certificate);
 }

@@ -63,7 +63,7 @@ std::variant<Options, int> ReadOptions(int argc, char **argv) {
     if (!faultName.empty()) {
       const std::optional<Fault> fault = ParseFault(faultName);
       if (!fault) {
-        throw CLI::ValidationError("--fault", "no fault is named '" + faultName + "'; see --help");
+        throw CLI::ValidationError("--fault", "unknown fault '" + faultName + "'; see --help");
       }
       options.fault = *fault;
     }

@@ -120,7 +120,7 @@ SignatureKey LoadSigningKey(const Identity &identity) {
   SignatureKey key(
       xmlSecOpenSSLAppKeyLoad(identity.keyFile.c_str(), xmlSecKeyDataFormatPem, nullptr, nullptr, nullptr));
   if (!key || xmlSecOpenSSLAppKeyCertLoad(key.get(), identity.certificateFile.c_str(), xmlSecKeyDataFormatPem) < 0) {
-    throw std::runtime_error(identity.keyFile.string() + ": libxmlsec1 does not read it");
+    throw std::runtime_error(identity.keyFile.string() + ": libxmlsec1 cannot read it");
   }
   return key;
 }
@@ -139,7 +139,7 @@ SignatureKey PublicKeyOf(const X509 &certificate) {
   }
   if (xmlSecKeySetValue(key.get(), data) < 0) {
     xmlSecKeyDataDestroy(data);
-    throw std::runtime_error("a key that libxmlsec1 does not take");
+    throw std::runtime_error("a key that libxmlsec1 does not accept");
   }
   return key;
 }

@@ -221,14 +221,14 @@ Identity OpenIdentity(const fs::path &folder, const Purpose &purpose, const Iden
   X509_check_purpose(identity.certificate.get(), -1, 0);
   const PrivateKey key = ReadKey(identity.keyFile);
   if (X509_check_private_key(identity.certificate.get(), key.get()) != 1) {
-    FailAt(identity.certificateFile, "does not belong to the key beside it");
+    FailAt(identity.certificateFile, "does not match the key in the same folder");
   }
   if (!purpose.isSelfSigned &&
       X509_verify(identity.certificate.get(), X509_get0_pubkey(authority->certificate.get())) != 1) {
-    FailAt(identity.certificateFile, "is of another authority; remove the state folder, and it is made anew");
+    FailAt(identity.certificateFile, "was issued by another authority; remove the state folder to have it made anew");
   }
   if (X509_cmp_current_time(X509_get0_notAfter(identity.certificate.get())) <= 0) {
-    FailAt(identity.certificateFile, "has expired; remove the state folder, and it is made anew");
+    FailAt(identity.certificateFile, "has expired; remove the state folder to have it made anew");
   }
   return identity;
 }

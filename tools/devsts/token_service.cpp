@@ -34,7 +34,7 @@ std::string ProofCertificate(const CheckedMessage &message, const TrustRequest &
     return {};
   }
   if (!message.signer) {
-    throw Refusal(Code::INVALID_REQUEST, "a holder-of-key token is asked for without proof of a key");
+    throw Refusal(Code::INVALID_REQUEST, "the request asks for a holder-of-key token without proof of a key");
   }
   // An exchange names no key: it is the presented token's.
   const bool mayOmitUseKey = message.presentedToken.has_value();
@@ -62,7 +62,7 @@ void ApplyDelegation(TokenFacts &facts, const TrustRequest &request, const Check
 void RequireAction(std::string_view action, const TrustRequest &request) {
   const std::string expected = std::string(Ns::WST.uri) + "/RST/" + RequestTypeName(request.type);
   if (action != expected) {
-    throw Refusal(Code::INVALID_REQUEST, "the SOAPAction does not fit the message");
+    throw Refusal(Code::INVALID_REQUEST, "the SOAPAction does not match the message");
   }
 }
 
@@ -109,7 +109,7 @@ std::vector<unsigned char> ReadLeg(const xmlNode &exchange) {
   const std::string text = TextOf(exchange);
   std::vector<unsigned char> leg = DecodeBase64(text);
   if (leg.empty() && !text.empty()) {
-    throw Refusal(Code::INVALID_REQUEST, "the binary exchange is no Base64");
+    throw Refusal(Code::INVALID_REQUEST, "the binary exchange is not Base64");
   }
   return leg;
 }
@@ -186,7 +186,7 @@ Document TokenService::Issue(const CheckedMessage &message, const TrustRequest &
 Document TokenService::BeginNegotiation(const CheckedMessage &message, const TrustRequest &request, const Fault &fault,
                                         std::string &log) const {
   if (message.presentedToken || message.credentials) {
-    throw Refusal(Code::INVALID_SECURITY, "the message negotiates and presents a token or a password as well");
+    throw Refusal(Code::INVALID_SECURITY, "the message negotiates and also presents a token or a password");
   }
   const std::string context = ReadContext(*message.request);
   NegotiatedRequest negotiated;
@@ -199,7 +199,7 @@ Document TokenService::BeginNegotiation(const CheckedMessage &message, const Tru
 Document TokenService::ContinueNegotiation(std::string_view action, const CheckedMessage &message, const Fault &fault,
                                            std::string &log) const {
   if (action != std::string(Ns::WST.uri) + "/RSTR/Issue") {
-    throw Refusal(Code::INVALID_REQUEST, "the SOAPAction does not fit the message");
+    throw Refusal(Code::INVALID_REQUEST, "the SOAPAction does not match the message");
   }
   const std::string context = ReadContext(*message.request);
   const std::vector<unsigned char> leg = ReadLeg(RequireChild(*message.request, Ns::WST, "BinaryExchange"));
@@ -272,7 +272,7 @@ TokenFacts TokenService::Authenticate(const CheckedMessage &message) const {
   if (message.signer) {
     return FactsOfCertificate(*message.signer);
   }
-  throw Refusal(Code::FAILED_AUTHENTICATION, "the message holds nothing that tells who sent it");
+  throw Refusal(Code::FAILED_AUTHENTICATION, "the message does not say who sent it");
 }
 
 TokenFacts TokenService::FactsOfUser(const PasswordCredentials &credentials) const {
@@ -288,7 +288,7 @@ TokenFacts TokenService::FactsOfUser(const PasswordCredentials &credentials) con
 void TokenService::SetClient(TokenFacts &facts, const std::string &principal) const {
   const User *const user = m_users.Find(UserOf(principal));
   if (!user) {
-    throw Refusal(Code::FAILED_AUTHENTICATION, principal + " is none of the users");
+    throw Refusal(Code::FAILED_AUTHENTICATION, "unknown user " + principal);
   }
   SetUser(facts, *user, KERBEROS_CONTEXT);
 }

@@ -54,7 +54,7 @@ std::map<std::string, User> ReadUsers(const Json &json) {
     User user = ReadUser(entry);
     const std::string name = user.name;
     if (!users.emplace(name, std::move(user)).second) {
-      throw std::runtime_error("'" + name + "' stands twice");
+      throw std::runtime_error("'" + name + "' occurs twice");
     }
   }
   return users;

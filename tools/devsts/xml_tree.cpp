@@ -67,7 +67,7 @@ void RegisterIdentifier(xmlNode &element, xmlAttr &attribute, Identifiers &ident
   const bool isKnown = attribute.atype == XML_ATTRIBUTE_ID;
   if (!identifiers.emplace(value, &element).second ||
       (!isKnown && !xmlAddID(nullptr, element.doc, XmlText(value.c_str()), &attribute))) {
-    throw Refusal(Code::INVALID_SECURITY, "the identifier '" + value + "' stands twice");
+    throw Refusal(Code::INVALID_SECURITY, "the identifier '" + value + "' occurs twice");
   }
 }
 

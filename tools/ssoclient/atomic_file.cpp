@@ -23,7 +23,7 @@ namespace {
 }
 
 [[noreturn]] void ThrowExists(const std::string &path) {
-  throw Tarvel::IOException(path + ": is there already; --force replaces it");
+  throw Tarvel::IOException(path + ": already exists; --force replaces it");
 }
 
 std::string FolderOf(const std::string &path) {
@@ -95,7 +95,7 @@ void RequireWritableFile(const std::string &path, bool replace) {
   if (lstat(path.c_str(), &status) == 0) {
     // A device, or the target of a symbolic link, is not what a caller means to replace by a token.
     if (!S_ISREG(status.st_mode)) {
-      throw Tarvel::IOException(path + ": is no regular file");
+      throw Tarvel::IOException(path + ": is not a regular file");
     }
     if (!replace) {
       ThrowExists(path);

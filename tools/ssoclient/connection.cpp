@@ -72,7 +72,7 @@ void CheckConnection(const ConnectionOptions &options) {
     return;
   }
   if (!options.allowHttp) {
-    throw UsageException("--sts is a plain http address, on which everybody can read along; --allow-http permits it");
+    throw UsageException("--sts is a plain http address, which is not encrypted; --allow-http permits it");
   }
   if (!options.caFile.empty() || !options.thumbprint.empty()) {
     throw UsageException("--ca and --thumbprint protect nothing on a plain http address");

@@ -11,12 +11,12 @@ namespace {
 constexpr const char *GROUP = "Credentials";
 
 constexpr Doubt DELEGATION_WITHOUT_PROOF = {
-    "with --delegate-to, a token is asked for that is bound to the identity's key, but without proof of the key, which "
-    "services refuse",
-    "give --bearer, too: with --user or --gss, a token for --delegate-to cannot be bound to a key"};
+    "with --delegate-to, the request asks for a token that is bound to the identity's key, but does not prove the key; "
+    "services refuse that",
+    "also give --bearer: with --user or --gss, a token for --delegate-to cannot be bound to a key"};
 
 constexpr Doubt EXCHANGE_OF_BEARER_TOKEN = {
-    "the token to exchange is a bearer token, whose exchange services refuse",
+    "the token to exchange is a bearer token; services refuse to exchange those",
     "an exchange needs a holder-of-key token; acquire one with the identity, and without --bearer"};
 
 /// The request for a delegated token is not signed, whatever kind of token it asks for.
@@ -58,7 +58,7 @@ IssuedToken AcquireByTicket(const AcquireCall &call) {
 
 void CheckCertificate(const TokenSpec &spec, bool) {
   if (spec.confirmation != TokenSpec::CONFIRMATION_DEFAULT) {
-    throw UsageException("--bearer does not go with an identity alone, whose token is bound to its key");
+    throw UsageException("--bearer cannot be combined with an identity alone, whose token is bound to its key");
   }
 }
 

@@ -66,7 +66,7 @@ Secret ReadFrom(int descriptor, const std::string &place, const std::string &sec
 Secret AskAtTerminal(const std::string &name, const std::string &prompt) {
   const int descriptor = open("/dev/tty", O_RDWR | O_CLOEXEC | O_NOCTTY);
   if (descriptor < 0) {
-    throw UsageException("there is no terminal to ask for the " + name + " at; give --" + name + "-file or --" + name +
+    throw UsageException("there is no terminal to prompt for the " + name + "; give --" + name + "-file or --" + name +
                          "-fd");
   }
   const InputDescriptor terminal(descriptor);

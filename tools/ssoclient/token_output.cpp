@@ -22,7 +22,7 @@ void ShowBeside(const std::string &file, const std::string &text) {
   try {
     WriteOutput(text);
   } catch (const Tarvel::IOException &failure) {
-    Warn(file + " is written, but not what it says: " + failure.what());
+    Warn(file + " was written, but what it says cannot be shown: " + failure.what());
   }
 }
 

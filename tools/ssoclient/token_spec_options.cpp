@@ -101,7 +101,7 @@ std::int64_t ParseLifetime(std::string_view text) {
   const std::int64_t unit = UnitSeconds(text.substr(digits));
   // No message repeats the text: it may be a secret in the wrong place.
   if ((error != std::errc() && error != std::errc::result_out_of_range) || digits == 0 || unit == 0) {
-    throw UsageException("--lifetime must be a number and s, m, h or d, such as 8h");
+    throw UsageException("--lifetime must be a duration such as 8h (units: s, m, h, d)");
   }
   if (error == std::errc() && number <= 0) {
     throw UsageException("--lifetime must be positive");

@@ -28,7 +28,7 @@ std::string RenderVerdict(bool isValid, Format format) {
 
 ExitCode Validate(const ValidateOptions &options, const OutputOptions &output) {
   if (output.format == Format::XML) {
-    throw UsageException("a verdict has no form in XML; give --format text or json");
+    throw UsageException("a verdict has no XML form; give --format text or json");
   }
   CheckConnection(options.connection);
 

@@ -158,7 +158,7 @@ TEST(State, IsRefusedWhenItsAuthorityHasChanged) {
   fs::remove(folder / "state/authority.crt");
   EXPECT_EQ(FailureOf({"--state", folder / "state"}),
             "development service: ended with 1: ssoclient-devsts: " + (folder / "state/tls.crt") +
-                ": is of another authority; remove the state folder, and it is made anew\n");
+                ": was issued by another authority; remove the state folder to have it made anew\n");
 }
 
 TEST(State, IsNotMadeWhenTheRestOfTheCommandLineIsWrong) {
@@ -181,7 +181,7 @@ TEST(State, IsRefusedWhenAKeyDoesNotFit) {
   fs::copy_file(folder / "state/client.key", folder / "state/signing.key", fs::copy_options::overwrite_existing);
   EXPECT_EQ(FailureOf({"--state", folder / "state"}),
             "development service: ended with 1: ssoclient-devsts: " + (folder / "state/signing.crt") +
-                ": does not belong to the key beside it\n");
+                ": does not match the key in the same folder\n");
 }
 
 TEST(State, IsRefusedWhenItIsNoFolder) {
@@ -214,7 +214,7 @@ TEST(UsersFile, IsRefusedWhenItIsOfAnotherForm) {
   EXPECT_EQ(refusal("{}"), begin + "not an array of users\n");
   EXPECT_THAT(refusal(R"([{"name":"carol@other.example"}])"), HasSubstr("key 'password' not found"));
   EXPECT_EQ(refusal(R"([{"name":"carol","password":""}])"), begin + "'carol' is not of the form name@domain\n");
-  EXPECT_EQ(refusal(R"([{"name":"c@d","password":""},{"name":"c@d","password":""}])"), begin + "'c@d' stands twice\n");
+  EXPECT_EQ(refusal(R"([{"name":"c@d","password":""},{"name":"c@d","password":""}])"), begin + "'c@d' occurs twice\n");
   EXPECT_EQ(FailureOf({"--users", folder / "missing"}),
             "development service: ended with 1: ssoclient-devsts: " + (folder / "missing") + ": cannot be read\n");
 }
@@ -224,7 +224,7 @@ TEST(CommandLine, RefusalsAreOneLineAndExitCode2) {
     std::vector<std::string> arguments;
     const char *message;
   } cases[] = {
-      {{"--fault", "no-such-fault"}, "--fault: no fault is named 'no-such-fault'; see --help"},
+      {{"--fault", "no-such-fault"}, "--fault: unknown fault 'no-such-fault'; see --help"},
       {{"--tolerance", "-1"}, "--tolerance: Value -1 not in range 0 to 86400"},
       {{"--port", "65536"}, "Could not convert: --port = 65536"},
       {{"--charset", "EBCDIC"}, "--charset: EBCDIC not in {UTF-8,ISO-8859-1,windows-1252}"},

@@ -43,7 +43,7 @@ TEST_F(Timestamps, StaleMessage) {
 }
 
 TEST_F(Timestamps, EarlyMessage) {
-  EXPECT_TRUE(IsRefused(SendMadeAhead(TOLERANCE + MARGIN), "wsse:InvalidSecurity", "the timestamp lies in the future"));
+  EXPECT_TRUE(IsRefused(SendMadeAhead(TOLERANCE + MARGIN), "wsse:InvalidSecurity", "the timestamp is in the future"));
 }
 
 TEST_F(Timestamps, OffByLessThanTheToleranceIsAccepted) {
@@ -70,7 +70,7 @@ TEST_F(Timestamps, MissingTimestamp) {
 TEST_F(Timestamps, TimestampThatIsNoDate) {
   const std::string text = PasswordRequest().body;
   EXPECT_TRUE(IsRefused(SendText(Replaced(text, Between(text, "<wsu:Created>", "<"), "today")), "wsse:InvalidSecurity",
-                        "Created of the timestamp is no UTC date"));
+                        "Created of the timestamp is not a UTC date"));
 }
 
 TEST_F(Timestamps, PeriodOfYears) {
@@ -110,7 +110,7 @@ TEST_F(Credentials, PasswordDigest) {
 
 TEST_F(Credentials, None) {
   EXPECT_TRUE(IsRefused(SendText(Without(PasswordRequest().body, "<wsse:UsernameToken ", "</wsse:UsernameToken>")),
-                        "wst:FailedAuthentication", "the message holds nothing that tells who sent it"));
+                        "wst:FailedAuthentication", "the message does not say who sent it"));
 }
 
 TEST_F(Credentials, UnknownKind) {
@@ -145,12 +145,12 @@ TEST_F(Proof, HolderOfKeyWithoutSignature) {
   SsoClient::Request request;
   BuilderFor(m_service, "client").BuildUserPassTokenRequest("alice@corp.example", "wonderland", spec, request);
   EXPECT_TRUE(IsRefused(Send(m_service, request), "wst:InvalidRequest",
-                        "a holder-of-key token is asked for without proof of a key"));
+                        "the request asks for a holder-of-key token without proof of a key"));
 }
 
 TEST_F(Proof, KeyTypeChangedToHolderOfKey) {
   EXPECT_TRUE(IsRefused(SendCorrupted("/Bearer<", "/PublicKey<"), "wst:InvalidRequest",
-                        "a holder-of-key token is asked for without proof of a key"));
+                        "the request asks for a holder-of-key token without proof of a key"));
 }
 
 TEST_F(Proof, UseKeyThatNamesAnotherSignature) {
@@ -245,9 +245,9 @@ TEST_F(Malformed, UnknownKeyType) {
 
 TEST_F(Malformed, ActionOfAnotherOperation) {
   EXPECT_TRUE(IsRefused(Post(m_service, SsoClient::Request::RENEW, PasswordRequest().body), "wst:InvalidRequest",
-                        "the SOAPAction does not fit the message"));
+                        "the SOAPAction does not match the message"));
   EXPECT_TRUE(IsRefused(Post(m_service, "", PasswordRequest().body), "wst:InvalidRequest",
-                        "the SOAPAction does not fit the message"));
+                        "the SOAPAction does not match the message"));
 }
 
 TEST_F(Malformed, CommentThatSplitsAText) {

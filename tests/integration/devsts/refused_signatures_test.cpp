@@ -84,7 +84,7 @@ TEST_F(RefusedSignatures, MissingSignatureBesideACertificate) {
 TEST_F(RefusedSignatures, MissingSignatureAndCertificate) {
   const std::string unsignedText = Without(m_request.body, "<ds:Signature ", "</ds:Signature>");
   EXPECT_TRUE(IsRefused(SendText(Without(unsignedText, "<wsse:BinarySecurityToken ", "</wsse:BinarySecurityToken>")),
-                        "wst:FailedAuthentication", "the message holds nothing that tells who sent it"));
+                        "wst:FailedAuthentication", "the message does not say who sent it"));
 }
 
 TEST_F(RefusedSignatures, BodyChangedAfterSigning) {
@@ -148,7 +148,7 @@ TEST_F(RefusedSignatures, IdentifierThatStandsTwice) {
   const std::string id = Between(m_request.body, "<soapenv:Body xmlns:wst=", " wsu:Id=\"");
   const std::string bodyId = Between(m_request.body, id + " wsu:Id=\"", "\"");
   EXPECT_TRUE(IsRefused(SendCorrupted("<wst:TokenType>", "<wst:TokenType Id=\"" + bodyId + "\">"),
-                        "wsse:InvalidSecurity", "the identifier '" + bodyId + "' stands twice"));
+                        "wsse:InvalidSecurity", "the identifier '" + bodyId + "' occurs twice"));
 }
 
 TEST_F(RefusedSignatures, ElementWithTwoIdentifiers) {
@@ -158,7 +158,7 @@ TEST_F(RefusedSignatures, ElementWithTwoIdentifiers) {
 
 TEST_F(RefusedSignatures, XmlIdCountsAsIdentifier) {
   EXPECT_TRUE(IsRefused(SendCorrupted("<wst:TokenType>", "<wst:TokenType xml:id=\"holderOfKeyCertificate\">"),
-                        "wsse:InvalidSecurity", "the identifier 'holderOfKeyCertificate' stands twice"));
+                        "wsse:InvalidSecurity", "the identifier 'holderOfKeyCertificate' occurs twice"));
 }
 
 TEST_F(RefusedSignatures, KeyOfAnotherCertificate) {
@@ -196,7 +196,7 @@ TEST_F(RefusedSignatures, KeyOf1024Bits) {
 TEST_F(RefusedSignatures, KeyReferenceToNoCertificate) {
   EXPECT_TRUE(IsRefused(SendCorrupted("URI=\"#holderOfKeyCertificate\"", "URI=\"#holderOfKeyProofSignature\""),
                         "wsse:SecurityTokenUnavailable",
-                        "the signature's key reference points at no binary security token"));
+                        "the signature's key reference does not refer to a binary security token"));
 }
 
 TEST_F(RefusedSignatures, ReferenceOutOfTheMessage) {
@@ -211,7 +211,7 @@ TEST_F(RefusedSignatures, ReferenceThatIsAnXPointer) {
 
 TEST_F(RefusedSignatures, ReferenceToNothing) {
   EXPECT_TRUE(IsRefused(SendCorrupted("<ds:Reference URI=\"#", "<ds:Reference URI=\"#no"), "wsse:InvalidSecurity",
-                        "the signature refers to what is not there"));
+                        "the signature refers to an element that does not exist"));
 }
 
 struct Algorithm {
@@ -269,7 +269,7 @@ TEST_F(RefusedSignatures, EnvelopedTransform) {
       SendCorrupted(
           "<ds:Transforms>",
           "<ds:Transforms><ds:Transform Algorithm=\"http://www.w3.org/2000/09/xmldsig#enveloped-signature\"/>"),
-      "wsse:InvalidSecurity", "the signature refers to what is not there"));
+      "wsse:InvalidSecurity", "the signature refers to an element that does not exist"));
 }
 
 TEST_F(RefusedSignatures, ManifestInTheSignature) {

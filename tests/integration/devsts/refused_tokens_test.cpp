@@ -64,12 +64,12 @@ TEST_F(RefusedTokens, ExchangeOfATokenThatIsNotValidYet) {
 
 TEST_F(RefusedTokens, ExchangeOfAForeignToken) {
   EXPECT_TRUE(IsRefused(Exchange(Acquire("wrong-signer")), "wsse:InvalidSecurityToken",
-                        "the token's signature is not this service's"));
+                        "the token is not signed by this service"));
 }
 
 TEST_F(RefusedTokens, ExchangeOfAChangedToken) {
   EXPECT_TRUE(IsRefused(Exchange(Acquire("tampered-token")), "wsse:InvalidSecurityToken",
-                        "the token's signature is not this service's"));
+                        "the token is not signed by this service"));
 }
 
 TEST_F(RefusedTokens, ExchangeOfAnUnsignedToken) {
@@ -82,7 +82,7 @@ TEST_F(RefusedTokens, ExchangeByAnotherKeyThanTheTokens) {
 
 TEST_F(RefusedTokens, ExchangeOfABearerTokenWhichNamesNoKey) {
   EXPECT_TRUE(IsRefused(Exchange(AcquireBearer()), "wsse:SecurityTokenUnavailable",
-                        "a bearer token names no key that could have signed the message"));
+                        "a bearer token has no key that could have signed the message"));
 }
 
 TEST_F(RefusedTokens, ExchangeWithoutSignature) {
@@ -100,7 +100,7 @@ TEST_F(RefusedTokens, ExchangeThatNamesAnotherTokensKey) {
   BuilderFor(m_service, "client").BuildExchangeTokenRequest(Acquire(), PlainSpec(), request);
   request.body = Replaced(request.body, "#SAMLID\">_", "#SAMLID\">_0");
   EXPECT_TRUE(IsRefused(Send(m_service, request), "wsse:SecurityTokenUnavailable",
-                        "the signature's key reference names no token of the message"));
+                        "the signature's key reference does not refer to a token of the message"));
 }
 
 TEST_F(RefusedTokens, DelegationOfATokenThatIsNotDelegable) {
@@ -135,14 +135,14 @@ TEST_F(RefusedTokens, RenewalOfAnExpiredToken) {
 }
 
 TEST_F(RefusedTokens, RenewalOfAForeignToken) {
-  EXPECT_TRUE(IsRefused(Renew(Acquire("wrong-signer")), "wst:InvalidSecurityToken",
-                        "the token's signature is not this service's"));
+  EXPECT_TRUE(
+      IsRefused(Renew(Acquire("wrong-signer")), "wst:InvalidSecurityToken", "the token is not signed by this service"));
 }
 
 TEST_F(RefusedTokens, RenewalOfAChangedToken) {
   const Testing::TokenStandIn token = Acquire({}, PlainSpec());
   EXPECT_TRUE(IsRefused(Renew(Changed(token, "Count=\"0\" Postdatable", "Count=\"9\" Postdatable")),
-                        "wst:InvalidSecurityToken", "the token's signature is not this service's"));
+                        "wst:InvalidSecurityToken", "the token is not signed by this service"));
 }
 
 TEST_F(RefusedTokens, RenewalOfABearerToken) {

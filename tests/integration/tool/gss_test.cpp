@@ -83,10 +83,10 @@ TEST_F(AcquireByTicket, IsSentWithAWarningAndRefusedWithAHintForADelegatedTokenT
   const std::string options = std::string(IDENTITY) + "--delegate-to bob@corp.example ";
   ExpectResult(
       AcquireWith(options), 8, "",
-      "ssoclient: warning: with --delegate-to, a token is asked for that is bound to the identity's key, but "
-      "without proof of the key, which services refuse\n"
+      "ssoclient: warning: with --delegate-to, the request asks for a token that is bound to the identity's key, "
+      "but does not prove the key; services refuse that\n"
       "ssoclient: service fault: Unexpected SOAP fault: wst:InvalidRequest; request failed.\n"
-      "ssoclient: hint: give --bearer, too: with --user or --gss, a token for --delegate-to cannot be bound to "
+      "ssoclient: hint: also give --bearer: with --user or --gss, a token for --delegate-to cannot be bound to "
       "a key\n");
   ExpectTokenOf("alice@corp.example", AcquireWith(options + "--bearer"));
 }
@@ -200,13 +200,14 @@ TEST_F(AcquireByTicket, FailsWhenTheServiceNegotiatesWithoutAContext) {
 TEST_F(AcquireByTicket, IsRefusedToAUserWhomTheServiceDoesNotKnow) {
   const std::string keytab = m_realm.AddPrincipal("mallory");
   ExpectResult(AcquireWith("--client-keytab " + PathOf(keytab)), 3, "",
-               "ssoclient: credentials refused: Authentication failed: mallory@CORP.EXAMPLE is none of the users\n");
+               "ssoclient: credentials refused: Authentication failed: unknown user mallory@CORP.EXAMPLE\n");
 }
 
 TEST_F(AcquireByTicket, IsAMistakeInTheCommandLineWithANameThatIsNoService) {
   LogIn();
-  ExpectResult(AcquireWith("--service HTTP"), 2, "",
-               "ssoclient: usage: Invalid argument : 'HTTP' is no service, as HTTP@host or HTTP/host@REALM\n");
+  ExpectResult(
+      AcquireWith("--service HTTP"), 2, "",
+      "ssoclient: usage: Invalid argument : 'HTTP' is not a service name such as HTTP@host or HTTP/host@REALM\n");
 }
 
 /// A clock that is two hours behind gives a ticket for one hour, which has expired an hour ago by everybody else's.

@@ -132,10 +132,10 @@ TEST_F(SecretInput, RefusesTheEndOfInputAtThePrompt) {
 
 TEST_F(SecretInput, WantsAnOptionWhereThereIsNoTerminal) {
   ExpectResult(RunShell("setsid -w " + ShellLine("--user alice")), 2, "",
-               "ssoclient: usage: there is no terminal to ask for the password at; give --password-file or "
+               "ssoclient: usage: there is no terminal to prompt for the password; give --password-file or "
                "--password-fd\n");
   ExpectResult(RunShell("setsid -w " + ShellLine("--cert rsa2048.crt --key rsa2048-encrypted.key"), KEYS), 2, "",
-               "ssoclient: usage: there is no terminal to ask for the passphrase at; give --passphrase-file or "
+               "ssoclient: usage: there is no terminal to prompt for the passphrase; give --passphrase-file or "
                "--passphrase-fd\n");
 }
 

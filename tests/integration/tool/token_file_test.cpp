@@ -52,7 +52,7 @@ TEST_F(TokenFile, IsReadableForItsOwnerAloneWhateverTheMask) {
 
 TEST_F(TokenFile, IsNotReplacedWithoutForce) {
   m_folder.Write("token.xml", "what was there");
-  ExpectResult(Run(Line()), 7, "", "ssoclient: file: token.xml: is there already; --force replaces it\n");
+  ExpectResult(Run(Line()), 7, "", "ssoclient: file: token.xml: already exists; --force replaces it\n");
   EXPECT_EQ("what was there", m_folder.Read("token.xml"));
   EXPECT_EQ("", m_service.GetLog()); // nothing was asked of the service
 }
@@ -74,7 +74,7 @@ TEST_F(TokenFile, ThatComesMeanwhileIsNotReplacedWithoutForce) {
   session.Type("wonderland\n");
   EXPECT_EQ(7, session.Finish());
   EXPECT_EQ("Password for alice@corp.example: \r\n"
-            "ssoclient: file: token.xml: is there already; --force replaces it\r\n",
+            "ssoclient: file: token.xml: already exists; --force replaces it\r\n",
             session.Shown());
   EXPECT_NE(std::string::npos, m_service.GetLog().find(": issued")) << m_service.GetLog();
   EXPECT_EQ("what came meanwhile", m_folder.Read("token.xml"));
@@ -88,8 +88,10 @@ TEST_F(TokenFile, IsNotThereWhenItCannotBeWrittenWhole) {
 
 TEST_F(TokenFile, IsThereAndNotReportedAsFailedWhenStandardOutputFails) {
   const std::string line = "ssoclient acquire " + Service() + PASSWORD + "--out token.xml ";
-  const std::string full = "token.xml is written, but not what it says: standard output: No space left on device";
-  const std::string closed = "token.xml is written, but not what it says: standard output: Bad file descriptor";
+  const std::string full =
+      "token.xml was written, but what it says cannot be shown: standard output: No space left on device";
+  const std::string closed =
+      "token.xml was written, but what it says cannot be shown: standard output: Bad file descriptor";
   ExpectResult(Run(line + ">/dev/full"), 0, "", "ssoclient: warning: " + full + "\n");
   EXPECT_TRUE(IsToken("token.xml"));
   EXPECT_EQ(WithToken(), m_folder.Names());
@@ -153,7 +155,7 @@ TEST_F(TokenFile, IsRefusedInPlaceOfALinkADeviceOrAFolder) {
   std::filesystem::create_directory(m_folder / "folder");
   for (const char *file : {"link.xml", "folder", "/dev/null"}) {
     ExpectResult(Run("ssoclient acquire " + Service() + PASSWORD + "--force --out " + file), 7, "",
-                 std::string("ssoclient: file: ") + file + ": is no regular file\n");
+                 std::string("ssoclient: file: ") + file + ": is not a regular file\n");
   }
   EXPECT_EQ("", m_service.GetLog());
 }

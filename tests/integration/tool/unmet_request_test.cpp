@@ -117,13 +117,13 @@ TEST_F(UnmetRequest, ShowsNothingThatSteersTheTerminal) {
 
 class DoubtfulRequest : public ServiceTest {};
 
-constexpr const char *DELEGATION_WARNING = "ssoclient: warning: with --delegate-to, a token is asked for that is bound "
-                                           "to the identity's key, but without proof "
-                                           "of the key, which services refuse\n";
+constexpr const char *DELEGATION_WARNING = "ssoclient: warning: with --delegate-to, the request asks for a token that "
+                                           "is bound to the identity's key, but does not prove the key; services "
+                                           "refuse that\n";
 constexpr const char *DELEGATION_HINT =
-    "give --bearer, too: with --user or --gss, a token for --delegate-to cannot be bound to a key";
+    "also give --bearer: with --user or --gss, a token for --delegate-to cannot be bound to a key";
 constexpr const char *EXCHANGE_WARNING =
-    "ssoclient: warning: the token to exchange is a bearer token, whose exchange services refuse\n";
+    "ssoclient: warning: the token to exchange is a bearer token; services refuse to exchange those\n";
 constexpr const char *EXCHANGE_HINT =
     "an exchange needs a holder-of-key token; acquire one with the identity, and without --bearer";
 
@@ -135,7 +135,7 @@ TEST_F(DoubtfulRequest, ForADelegatedTokenBesideAnIdentityIsSentWithAWarningAndR
                    "ssoclient: service fault: Unexpected SOAP fault: wst:InvalidRequest; request failed.\n"
                    "ssoclient: hint: " +
                    DELEGATION_HINT + "\n");
-  EXPECT_THAT(m_service.GetLog(), HasSubstr("a holder-of-key token is asked for without proof of a key"));
+  EXPECT_THAT(m_service.GetLog(), HasSubstr("the request asks for a holder-of-key token without proof of a key"));
   ExpectResult(Run(line + "--format json"), 8, "",
                R"({"schema":1,"error":{"class":"SsoException","message":)"
                R"("Unexpected SOAP fault: wst:InvalidRequest; request failed.","hint":")" +
