@@ -14,7 +14,7 @@ namespace SsoClient::Gssapi {
 void ImportName(const std::string &text, gss_const_OID form, NameHandle &name) {
   std::string octets = text;
   gss_buffer_desc buffer = {octets.size(), octets.data()};
-  // The form is only read; the GSSAPI's declarations know no const.
+  // A copy, because the GSSAPI's declarations do not use const. The form is only read.
   gss_OID_desc writableForm = *form;
   GssStatus status;
   status.major = gss_import_name(&status.minor, &buffer, &writableForm, name.Slot());
@@ -32,6 +32,18 @@ void ImportServiceName(const std::string &service, NameHandle &name) {
                                            "' is not a service name such as HTTP@host or HTTP/host@REALM");
   }
   ImportName(service, isPrincipal ? GSS_KRB5_NT_PRINCIPAL_NAME : GSS_C_NT_HOSTBASED_SERVICE, name);
+}
+
+gss_OID SpnegoMechanism() noexcept {
+  static char octets[] = "\x2b\x06\x01\x05\x05\x02";
+  static gss_OID_desc description = {sizeof octets - 1, octets};
+  return &description;
+}
+
+gss_OID KerberosMechanism() noexcept {
+  static char octets[] = "\x2a\x86\x48\x86\xf7\x12\x01\x02\x02";
+  static gss_OID_desc description = {sizeof octets - 1, octets};
+  return &description;
 }
 
 } // namespace SsoClient::Gssapi
