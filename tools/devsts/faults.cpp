@@ -135,14 +135,14 @@ std::optional<Fault> ParseNumberedFault(std::string_view name) {
   return std::nullopt;
 }
 
-/// The first element of that local name at or below `root`.
+/// The first element with that local name at or below `root`.
 xmlNode *FindBelow(xmlNode *root, const char *name) {
   if (!root || xmlStrEqual(root->name, XmlText(name))) {
     return root;
   }
   for (xmlNode *child : ChildElements(*root)) {
     if (xmlStrEqual(child->name, XmlText("Assertion"))) {
-      continue; // what is to be spoilt stands around the token, not in it
+      continue; // these faults change the response around the token, not the token
     }
     if (xmlNode *found = FindBelow(child, name)) {
       return found;
@@ -170,7 +170,7 @@ void Remove(xmlNode *element) {
   }
 }
 
-/// What is wrong with a leg of a negotiation. A response without one stays as it is.
+/// Corrupts the leg of a negotiation. A response without a leg stays as it is.
 void CorruptLeg(xmlNode *root, DocumentFault fault) {
   xmlNode *const response = FindBelow(root, "RequestSecurityTokenResponse");
   xmlNode *const exchange = FindBelow(root, "BinaryExchange");
@@ -193,7 +193,7 @@ void CorruptLeg(xmlNode *root, DocumentFault fault) {
   }
 }
 
-/// A response in a collection loses it, any other gets one.
+/// Removes the collection around a response, or adds one when there is none.
 void SwapWrapper(xmlNode &body) {
   xmlNode &content = *ChildElements(body).front();
   if (IsElement(content, Ns::WST, "RequestSecurityTokenResponseCollection")) {
@@ -209,7 +209,7 @@ void SwapWrapper(xmlNode &body) {
   xmlAddChild(&collection, &content);
 }
 
-/// An element in an element in an element and so on.
+/// Adds many nested elements.
 void Deepen(xmlNode &body) {
   xmlNode *innermost = &body;
   for (int level = 0; level < DEEP_LEVELS; ++level) {
@@ -217,7 +217,7 @@ void Deepen(xmlNode &body) {
   }
 }
 
-/// What stands in the body becomes the document.
+/// Makes the content of the body the whole document.
 void RemoveEnvelope(xmlDoc &response, xmlNode &body) {
   xmlNode *const content = ChildElements(body).front();
   xmlUnlinkNode(content);
@@ -286,7 +286,7 @@ void CorruptFacts(TokenFacts &facts, TokenFault fault) {
   case TokenFault::BEARER:
     facts.certificate.clear();
     return;
-  case TokenFault::PLAIN: // whatever was asked for
+  case TokenFault::PLAIN: // without anything that was asked for
     facts.delegation.clear();
     facts.audience.clear();
     facts.advice.clear();

@@ -12,7 +12,7 @@ namespace {
 
 constexpr std::chrono::hours LONGEST_MESSAGE_LIFE(24);
 
-/// What may stand in the security header, each at most once.
+/// The elements that the security header may have, each at most once.
 struct SecurityHeader {
   xmlNode *timestamp = nullptr;
   xmlNode *usernameToken = nullptr;
@@ -109,7 +109,7 @@ PasswordCredentials ReadCredentials(const xmlNode &usernameToken) {
   return {TextOf(RequireChild(usernameToken, Ns::WSSE, "Username")), TextOf(password)};
 }
 
-/// The body and the timestamp, these very elements, must be what is signed.
+/// The signed elements must be the body and the timestamp of this envelope, and no others.
 void RequireCoverage(const Envelope &envelope, const Identifiers &identifiers) {
   std::vector<const xmlNode *> covered;
   for (const SignatureReference &reference : ReadReferences(*envelope.security.signature)) {
@@ -126,7 +126,7 @@ void RequireCoverage(const Envelope &envelope, const Identifiers &identifiers) {
   }
 }
 
-/// The certificate of the binary token, which `reference` must point at.
+/// The certificate in the binary token, to which `reference` must refer.
 Certificate BinaryTokenCertificate(const Envelope &envelope, const Identifiers &identifiers, const xmlNode &reference) {
   const xmlNode *const token = envelope.security.binaryToken;
   const std::string uri = AttributeOf(reference, "URI").value_or("");
@@ -141,7 +141,7 @@ Certificate BinaryTokenCertificate(const Envelope &envelope, const Identifiers &
   return DecodeCertificate(TextOf(*token));
 }
 
-/// The certificate that the presented assertion confirms its holder by.
+/// The certificate of the key that the presented assertion is bound to.
 Certificate HolderCertificate(const Envelope &envelope, const CheckedMessage &message, const xmlNode &keyIdentifier) {
   if (!message.presentedToken || AttributeOf(keyIdentifier, "ValueType").value_or("") != SAML_ID_VALUE_TYPE ||
       TextOf(keyIdentifier) != AttributeOf(*envelope.security.assertion, "ID")) {
@@ -181,7 +181,7 @@ void CheckSignature(const Envelope &envelope, CheckedMessage &message) {
   message.signatureId = AttributeOf(*envelope.security.signature, "Id").value_or("");
 }
 
-/// A token or certificate in the header means something only beside the proof that the sender holds its key.
+/// A token or certificate in the header counts only together with the proof that the sender has its key.
 void RequireSignatureWhereNeeded(const SecurityHeader &security) {
   if (!security.signature && (security.assertion || security.binaryToken)) {
     RefuseSecurity("the message presents a token or certificate and is not signed");

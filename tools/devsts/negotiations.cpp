@@ -40,7 +40,7 @@ NegotiationStep Negotiations::Continue(const std::string &context, const std::ve
     if (!found->second.acceptance) {
       throw Refusal(Code::INVALID_REQUEST, "a leg of that negotiation is being accepted");
     }
-    negotiation = std::move(found->second); // its place stays, without an acceptance
+    negotiation = std::move(found->second); // the entry stays, with a null acceptance
   }
   return Accept(context, leg, std::move(negotiation));
 }

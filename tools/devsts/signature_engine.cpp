@@ -21,7 +21,7 @@ namespace DevSts {
 
 namespace {
 
-// Longer than any certificate, so that Base64 text stands in one line; 0 is not taken everywhere.
+// Longer than any certificate, so that Base64 text has no line breaks. Not every version of libxmlsec1 accepts 0.
 constexpr int LINE_SIZE = 1 << 20;
 
 struct ContextDeleter {
@@ -29,7 +29,7 @@ struct ContextDeleter {
 };
 using Context = std::unique_ptr<xmlSecDSigCtx, ContextDeleter>;
 
-// What is refused is logged by the service in one line of its own.
+// The service itself logs a refusal, in one line.
 void DropError(const char *, int, const char *, const char *, const char *, int, const char *) {}
 void DropXmlError(void *, const char *, ...) {} // NOLINT(cert-dcl50-cpp): libxml2's own signature
 
@@ -54,7 +54,7 @@ void RequireAlgorithm(const xmlNode &method, std::string_view expected) {
   }
 }
 
-/// Exactly these children, in this order.
+/// The children of `parent`. @throws Refusal unless they are exactly these, in this order
 std::vector<xmlNode *> RequireChildren(const xmlNode &parent, std::initializer_list<const char *> names) {
   std::vector<xmlNode *> children = ChildElements(parent);
   bool matches = children.size() == names.size();
@@ -68,7 +68,7 @@ std::vector<xmlNode *> RequireChildren(const xmlNode &parent, std::initializer_l
   return children;
 }
 
-// libxmlsec1 makes an XPointer of the identifier, so it must not hold a quotation mark.
+// libxmlsec1 puts the identifier into an XPointer, so it must not contain a quotation mark.
 bool IsPlainIdentifier(std::string_view id) {
   constexpr std::string_view PLAIN = "ABCDEFGHIJKLMNOPQRSTUVWXYZabcdefghijklmnopqrstuvwxyz0123456789_.-";
   return !id.empty() && id.find_first_not_of(PLAIN) == std::string_view::npos;

@@ -9,7 +9,7 @@ namespace DevSts {
 namespace {
 
 [[noreturn]] void RefuseToken(const std::string &reason) {
-  throw Refusal(Code::INVALID_TOKEN, reason); // the code is the caller's in the end
+  throw Refusal(Code::INVALID_TOKEN, reason); // `ReadIssuedToken` replaces the code
 }
 
 std::string RequireAttribute(const xmlNode &element, const char *name) {

@@ -17,7 +17,7 @@ namespace {
 constexpr std::uint64_t RENEWALS = 10;
 constexpr std::uint64_t DELEGATIONS = 10;
 
-/// "admins@corp.example" as tokens write it: "corp.example\admins".
+/// The form that a group has in tokens: "corp.example\admins" for "admins@corp.example".
 std::string GroupText(const std::string &group) {
   const std::size_t at = group.rfind('@');
   return group.substr(at + 1) + "\\" + group.substr(0, at);
@@ -28,7 +28,7 @@ void SetLife(TokenFacts &facts, std::chrono::milliseconds lifetime) {
   facts.notOnOrAfter = facts.notBefore + lifetime;
 }
 
-/// The key that a holder-of-key token is to confirm is the one that has signed the request.
+/// The certificate for a holder-of-key token, which is bound to the key that has signed the request.
 std::string ProofCertificate(const CheckedMessage &message, const TrustRequest &request) {
   if (!request.wantsHolderOfKey) {
     return {};
@@ -36,7 +36,7 @@ std::string ProofCertificate(const CheckedMessage &message, const TrustRequest &
   if (!message.signer) {
     throw Refusal(Code::INVALID_REQUEST, "the request asks for a holder-of-key token without proof of a key");
   }
-  // An exchange names no key: it is the presented token's.
+  // A request for an exchange has no wst:UseKey: the key is the presented token's.
   const bool mayOmitUseKey = message.presentedToken.has_value();
   if (request.useKey ? *request.useKey != message.signatureId : !mayOmitUseKey) {
     throw Refusal(Code::INVALID_REQUEST, "wst:UseKey does not name the message's signature");
@@ -66,7 +66,7 @@ void RequireAction(std::string_view action, const TrustRequest &request) {
   }
 }
 
-/// What the token is to say, who it is for apart.
+/// Sets all facts that the request asks for; the subject is set elsewhere.
 void ApplyRequest(TokenFacts &facts, const CheckedMessage &message, const TrustRequest &request) {
   facts.certificate = ProofCertificate(message, request);
   facts.audience = request.audience;
@@ -84,7 +84,7 @@ void SetUser(TokenFacts &facts, const User &user, const char *context) {
   std::transform(user.groups.begin(), user.groups.end(), std::back_inserter(facts.groups), GroupText);
 }
 
-/// "alice@CORP.EXAMPLE" as the service names its users: "alice@corp.example".
+/// The user's name for a principal: "alice@corp.example" for "alice@CORP.EXAMPLE".
 std::string UserOf(std::string principal) {
   const std::size_t at = std::min(principal.rfind('@'), principal.size());
   std::transform(principal.begin() + static_cast<std::ptrdiff_t>(at), principal.end(),
