@@ -24,7 +24,7 @@ using Testing::DevSts;
 using testing::HasSubstr;
 using Testing::WorkFolder;
 
-/// What a start that must fail says.
+/// The message of a start that must fail.
 std::string FailureOf(const std::vector<std::string> &arguments) {
   try {
     const DevSts service(arguments);
@@ -34,7 +34,7 @@ std::string FailureOf(const std::vector<std::string> &arguments) {
   return "started";
 }
 
-/// What the program writes to standard output, and the exit code behind it.
+/// What the program writes to standard output, followed by its exit code.
 std::string OutputOf(const std::string &arguments) {
   std::FILE *const stream = ::popen((DevSts::GetProgram() + (" " + arguments) + " </dev/null").c_str(), "r");
   std::string output;
@@ -61,7 +61,7 @@ TEST(Process, EndsWhenItsStandardInputEnds) {
   EXPECT_EQ(service.End().exitCode, 0);
 }
 
-TEST(Process, EndsAtOnceThoughConnectionsAreOpen) {
+TEST(Process, EndsAtOnceEvenWhenConnectionsAreOpen) {
   DevSts service;
   TlsClient idle(service);
   TlsClient stalled(service);
@@ -69,7 +69,7 @@ TEST(Process, EndsAtOnceThoughConnectionsAreOpen) {
   EXPECT_EQ(service.End(SIGTERM).exitCode, 0);
 }
 
-TEST(Process, ThatEndsBadlyFailsTheTestsThatUseIt) {
+TEST(Process, ThatCrashesFailsTheTestsThatUseIt) {
   testing::FLAGS_gtest_death_test_style = "threadsafe";
   const auto abortService = [] {
     const DevSts service;
@@ -78,7 +78,7 @@ TEST(Process, ThatEndsBadlyFailsTheTestsThatUseIt) {
   EXPECT_EXIT(abortService(), testing::ExitedWithCode(EXIT_FAILURE), "The development service has ended with 134\n");
 }
 
-TEST(Process, ReadyLineTellsAddressAndFiles) {
+TEST(Process, ReadyLineHasTheAddressAndTheFiles) {
   const DevSts service;
   const Testing::JsonObject ready = Testing::ReadJsonObject(service.GetReadyLine());
   EXPECT_EQ(ready.numbers.at("schema"), 1);
@@ -107,7 +107,7 @@ TEST(Process, RefusesAPortThatIsTaken) {
   EXPECT_THAT(FailureOf({"--port", std::to_string(service.GetPort())}), HasSubstr("Address already in use"));
 }
 
-TEST(State, IsForItsOwnerAlone) {
+TEST(State, IsOnlyForItsOwner) {
   const WorkFolder folder;
   const DevSts service({"--state", folder / "state"});
   EXPECT_EQ(fs::status(folder / "state").permissions(), fs::perms::owner_all);
@@ -175,7 +175,7 @@ TEST(State, IsCompletedWhenAStartWasInterrupted) {
   EXPECT_TRUE(IsIssued(Send(service, CertificateRequest(service))));
 }
 
-TEST(State, IsRefusedWhenAKeyDoesNotFit) {
+TEST(State, IsRefusedWhenAKeyDoesNotMatchItsCertificate) {
   const WorkFolder folder;
   { const DevSts service({"--state", folder / "state"}); }
   fs::copy_file(folder / "state/client.key", folder / "state/signing.key", fs::copy_options::overwrite_existing);
@@ -184,7 +184,7 @@ TEST(State, IsRefusedWhenAKeyDoesNotFit) {
                 ": does not match the key in the same folder\n");
 }
 
-TEST(State, IsRefusedWhenItIsNoFolder) {
+TEST(State, IsRefusedWhenItIsNotAFolder) {
   const WorkFolder folder;
   const std::string file = folder.Write("file", "");
   EXPECT_EQ(FailureOf({"--state", file}),
@@ -203,7 +203,7 @@ TEST(UsersFile, ReplacesTheKnownUsers) {
       IsRefused(Send(service, PasswordRequest()), "wst:FailedAuthentication", "unknown user or wrong password"));
 }
 
-TEST(UsersFile, IsRefusedWhenItIsOfAnotherForm) {
+TEST(UsersFile, IsRefusedWhenItHasAnotherForm) {
   const WorkFolder folder;
   const auto refusal = [&folder](const std::string &content) {
     return FailureOf({"--users", folder.Write("users.json", content)});
@@ -219,7 +219,7 @@ TEST(UsersFile, IsRefusedWhenItIsOfAnotherForm) {
             "development service: ended with 1: ssoclient-devsts: " + (folder / "missing") + ": cannot be read\n");
 }
 
-TEST(CommandLine, RefusalsAreOneLineAndExitCode2) {
+TEST(CommandLine, IsRefusedWithOneLineAndExitCode2) {
   const struct {
     std::vector<std::string> arguments;
     const char *message;
@@ -238,7 +238,7 @@ TEST(CommandLine, RefusalsAreOneLineAndExitCode2) {
   EXPECT_EQ(OutputOf("2>&1"), "ssoclient-devsts: --state is required\nexit code 2");
 }
 
-TEST(CommandLine, HelpTellsOptionsFaultsAndExamplesOnStandardOutput) {
+TEST(CommandLine, HelpShowsOptionsFaultsAndExamplesOnStandardOutput) {
   const std::string help = OutputOf("--help 2>&1");
   for (const char *part : {"Usage: ssoclient-devsts [OPTIONS]\n", "--until-eof ", "\nFaults:\n", " bad-status-NNN",
                            " soap-fault-FailedAuthentication", "\nExamples:\n  ssoclient-devsts --state "}) {

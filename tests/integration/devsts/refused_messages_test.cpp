@@ -1,5 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
-// Messages that are stale, carry no or wrong credentials, ask for what they prove no right to, or are no messages at all.
+// Messages that are out of date, have missing or wrong credentials, ask for more than they prove, or are malformed.
 
 #include "messages.h"
 
@@ -12,9 +12,9 @@ using std::chrono::seconds;
 
 /// How far clocks may differ by the service's default.
 constexpr seconds TOLERANCE(60);
-/// How long the library's messages are good.
+/// How long the library's messages are valid.
 constexpr seconds MESSAGE_LIFE(600);
-/// So much that a busy machine's delay does not matter.
+/// Long enough that delays of a busy machine do not matter.
 constexpr seconds MARGIN(30);
 
 constexpr const char *WST = "http://docs.oasis-open.org/ws-sx/ws-trust/200512";
@@ -26,7 +26,7 @@ protected:
     return SendText(Replaced(PasswordRequest().body, from, to));
   }
 
-  /// A signed request made when the client's clock was so far ahead.
+  /// Sends a signed request that was made with the client's clock ahead by this much.
   HttpAnswer SendMadeAhead(seconds ahead) {
     const ShiftedClock clock(ahead);
     return Send(m_service, CertificateRequest(m_service));
@@ -57,7 +57,7 @@ TEST(TimestampTolerance, IsWhatTheServiceIsStartedWith) {
   EXPECT_TRUE(IsIssued(Send(service, PasswordRequest())));
 }
 
-TEST_F(Timestamps, UnsignedMessagesAreHeldToThemToo) {
+TEST_F(Timestamps, UnsignedMessagesAreCheckedToo) {
   const ShiftedClock clock(-MESSAGE_LIFE - TOLERANCE - seconds(1));
   EXPECT_TRUE(IsRefused(Send(m_service, PasswordRequest()), "wsu:MessageExpired", "the message has expired"));
 }
@@ -67,7 +67,7 @@ TEST_F(Timestamps, MissingTimestamp) {
                         "wsse:InvalidSecurity", "no timestamp"));
 }
 
-TEST_F(Timestamps, TimestampThatIsNoDate) {
+TEST_F(Timestamps, TimestampThatIsNotADate) {
   const std::string text = PasswordRequest().body;
   EXPECT_TRUE(IsRefused(SendText(Replaced(text, Between(text, "<wsu:Created>", "<"), "today")), "wsse:InvalidSecurity",
                         "Created of the timestamp is not a UTC date"));
@@ -97,7 +97,7 @@ TEST_F(Credentials, EmptyPassword) {
                         "unknown user or wrong password"));
 }
 
-// The same words as for a wrong password, so that nobody learns which users there are.
+// The same text as for a wrong password, so that the message does not reveal which users exist.
 TEST_F(Credentials, UnknownUser) {
   EXPECT_TRUE(IsRefused(Send(m_service, PasswordRequest("nobody@corp.example", "")), "wst:FailedAuthentication",
                         "unknown user or wrong password"));
@@ -153,7 +153,7 @@ TEST_F(Proof, KeyTypeChangedToHolderOfKey) {
                         "the request asks for a holder-of-key token without proof of a key"));
 }
 
-TEST_F(Proof, UseKeyThatNamesAnotherSignature) {
+TEST_F(Proof, UseKeyThatRefersToAnotherSignature) {
   const std::string text = CertificateRequest(m_service).body;
   EXPECT_TRUE(IsRefused(SendText(Replaced(text, " Id=\"holderOfKeyProofSignature\"", " Id=\"otherSignature\"")),
                         "wst:InvalidRequest", "wst:UseKey does not name the message's signature"));
@@ -255,7 +255,7 @@ TEST_F(Malformed, CommentThatSplitsAText) {
                         "Username must hold text alone"));
 }
 
-TEST_F(Malformed, ElementThatStandsTwice) {
+TEST_F(Malformed, ElementThatOccursTwice) {
   EXPECT_TRUE(IsRefused(SendCorrupted("<wst:Delegatable>", "<wst:Delegatable>true</wst:Delegatable><wst:Delegatable>"),
                         "wst:InvalidRequest", "several wst:Delegatable"));
 }

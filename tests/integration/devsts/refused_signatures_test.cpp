@@ -1,5 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
-// Signed messages that were spoilt after signing, or signed by the wrong key or over the wrong elements.
+// Signed messages that were changed after signing, or signed with the wrong key or over the wrong elements.
 
 #include "messages.h"
 
@@ -23,7 +23,7 @@ constexpr const char *NOT_COVERED = "the signature must cover the body and the t
 
 class RefusedSignatures : public testing::Test {
 protected:
-  /// Sends the request with its text replaced.
+  /// Sends the request with `from` replaced.
   HttpAnswer SendCorrupted(const std::string &from, const std::string &to) {
     return SendText(Replaced(m_request.body, from, to));
   }
@@ -37,13 +37,13 @@ TEST_F(RefusedSignatures, AcceptsTheSameMessageUnchanged) {
   EXPECT_TRUE(IsIssued(Send(m_service, m_request)));
 }
 
-/// What a token says of its subject and of delegation.
+/// What a token says about its subject and about delegation.
 std::string SaidIn(const HttpAnswer &answer) {
   return Between(answer.body, "<saml:Subject>", "</saml:Subject>") +
          Between(answer.body, "<saml:ProxyRestriction ", ">");
 }
 
-TEST_F(RefusedSignatures, MessageWithOneBitChangedYieldsARefusalOrWhatWasSigned) {
+TEST_F(RefusedSignatures, MessageWithOneBitChangedIsRefusedOrGetsWhatWasSigned) {
   constexpr std::size_t STEP = 3; // every octet would take too long
   const std::string signedSaying = SaidIn(Send(m_service, m_request));
   TlsClient client(m_service);
@@ -60,7 +60,7 @@ TEST_F(RefusedSignatures, MessageWithOneBitChangedYieldsARefusalOrWhatWasSigned)
     ASSERT_TRUE(IsIssued(answer)) << at;
     EXPECT_EQ(SaidIn(answer), signedSaying) << at;
   }
-  // Else only a few names that mean nothing, as a prefix that is declared and used alike.
+  // The rest are a few names without meaning, such as a prefix that changes in both its declaration and its use.
   EXPECT_GT(refusals, m_request.body.size() / STEP * 95 / 100);
 }
 
@@ -76,7 +76,7 @@ TEST_F(RefusedSignatures, EmptySignatureValue) {
                         WRONG_SIGNATURE));
 }
 
-TEST_F(RefusedSignatures, MissingSignatureBesideACertificate) {
+TEST_F(RefusedSignatures, MissingSignatureDespiteACertificate) {
   EXPECT_TRUE(IsRefused(SendText(Without(m_request.body, "<ds:Signature ", "</ds:Signature>")), "wsse:InvalidSecurity",
                         "the message presents a token or certificate and is not signed"));
 }
@@ -99,7 +99,7 @@ TEST_F(RefusedSignatures, BodySwappedForThatOfAnotherSignedMessage) {
                         "wsse:FailedCheck", WRONG_SIGNATURE));
 }
 
-// The signed body still stands in the message and still verifies, but it is not the body that is obeyed.
+// The signed body is still in the message, and still verifies, but it is not the body that the service reads.
 TEST_F(RefusedSignatures, SignedBodyMovedAsideForAnotherBody) {
   const std::string signedBody = "<soapenv:Body " + Between(m_request.body, "<soapenv:Body ", "</soapenv:Body>");
   const std::string content = Between(m_request.body, "<wst:RequestSecurityToken ", "</wst:RequestSecurityToken>");
@@ -109,7 +109,7 @@ TEST_F(RefusedSignatures, SignedBodyMovedAsideForAnotherBody) {
   EXPECT_TRUE(IsRefused(SendCorrupted(signedBody, forged), "wsse:InvalidSecurity", NOT_COVERED));
 }
 
-TEST_F(RefusedSignatures, SecondBodyBesideTheSignedOne) {
+TEST_F(RefusedSignatures, SecondBodyNextToTheSignedOne) {
   EXPECT_TRUE(IsRefused(SendCorrupted("<soapenv:Body ", "<soapenv:Body/><soapenv:Body "), "soapenv:Client",
                         "an envelope must hold one header and one body"));
 }
@@ -144,7 +144,7 @@ TEST_F(RefusedSignatures, TimestampThatIsNotSigned) {
                 "wsse:InvalidSecurity", NOT_COVERED));
 }
 
-TEST_F(RefusedSignatures, IdentifierThatStandsTwice) {
+TEST_F(RefusedSignatures, IdentifierThatOccursTwice) {
   const std::string id = Between(m_request.body, "<soapenv:Body xmlns:wst=", " wsu:Id=\"");
   const std::string bodyId = Between(m_request.body, id + " wsu:Id=\"", "\"");
   EXPECT_TRUE(IsRefused(SendCorrupted("<wst:TokenType>", "<wst:TokenType Id=\"" + bodyId + "\">"),
@@ -193,13 +193,13 @@ TEST_F(RefusedSignatures, KeyOf1024Bits) {
                         "the signer's certificate must hold an RSA key of at least 2048 bits"));
 }
 
-TEST_F(RefusedSignatures, KeyReferenceToNoCertificate) {
+TEST_F(RefusedSignatures, KeyReferenceToAnElementThatIsNotACertificate) {
   EXPECT_TRUE(IsRefused(SendCorrupted("URI=\"#holderOfKeyCertificate\"", "URI=\"#holderOfKeyProofSignature\""),
                         "wsse:SecurityTokenUnavailable",
                         "the signature's key reference does not refer to a binary security token"));
 }
 
-TEST_F(RefusedSignatures, ReferenceOutOfTheMessage) {
+TEST_F(RefusedSignatures, ReferenceToAnotherDocument) {
   EXPECT_TRUE(IsRefused(SendCorrupted("<ds:Reference URI=\"#", "<ds:Reference URI=\"https://localhost/#"),
                         "wsse:InvalidSecurity", "a signature may refer to elements of the message alone"));
 }
@@ -209,7 +209,7 @@ TEST_F(RefusedSignatures, ReferenceThatIsAnXPointer) {
                         "wsse:InvalidSecurity", "a signature may refer to elements of the message alone"));
 }
 
-TEST_F(RefusedSignatures, ReferenceToNothing) {
+TEST_F(RefusedSignatures, ReferenceToAMissingElement) {
   EXPECT_TRUE(IsRefused(SendCorrupted("<ds:Reference URI=\"#", "<ds:Reference URI=\"#no"), "wsse:InvalidSecurity",
                         "the signature refers to an element that does not exist"));
 }
@@ -218,7 +218,7 @@ struct Algorithm {
   const char *name;
   const char *from;
   const char *to;
-  const char *refused; ///< the algorithm that the refusal names
+  const char *refused; ///< the algorithm in the refusal
 };
 
 void PrintTo(const Algorithm &algorithm, std::ostream *out) {

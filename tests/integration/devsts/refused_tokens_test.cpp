@@ -1,5 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
-// Exchange, renewal and validation of tokens that are expired, foreign, changed, somebody else's, or not made for it.
+// Exchange, renewal and validation of tokens that are expired, foreign, changed, bound to another key, or of the wrong
+// kind.
 
 #include "messages.h"
 
@@ -11,7 +12,7 @@ constexpr const char *INVALID = "http://docs.oasis-open.org/ws-sx/ws-trust/20051
 
 class RefusedTokens : public testing::Test {
 protected:
-  /// A holder-of-key token for "client", by way of a fault if there is one.
+  /// A holder-of-key token for "client", issued with `fault` unless that is empty.
   Testing::TokenStandIn Acquire(const std::string &fault = {}, const SsoClient::TokenSpec &spec = RenewableSpec()) {
     return TokenIn(
         Send(m_service, CertificateRequest(m_service, spec), fault.empty() ? "/sts" : "/sts/fault/" + fault));
@@ -31,14 +32,14 @@ protected:
     return Send(m_service, request);
   }
 
-  /// The status that the service gives the token.
+  /// The status that the service reports for the token.
   std::string Validate(const SsoClient::SamlToken &token) {
     SsoClient::Request request;
     BuilderFor(m_service, "").BuildValidateSubjectRequest(token, request);
     return Between(Send(m_service, request).body, "<wst:Code>", "</wst:Code>");
   }
 
-  /// The token with a text replaced after signing.
+  /// The token with a text replaced after it was signed.
   static Testing::TokenStandIn Changed(const SsoClient::SamlToken &token, const std::string &from,
                                        const std::string &to) {
     return {token.GetId(), Replaced(token.ToXml(), from, to), token.GetConfirmationMethod()};
@@ -80,7 +81,7 @@ TEST_F(RefusedTokens, ExchangeByAnotherKeyThanTheTokens) {
   EXPECT_TRUE(IsRefused(Exchange(Acquire(), "other-client"), "wsse:FailedCheck", "the message's signature is wrong"));
 }
 
-TEST_F(RefusedTokens, ExchangeOfABearerTokenWhichNamesNoKey) {
+TEST_F(RefusedTokens, ExchangeOfABearerTokenWhichHasNoKey) {
   EXPECT_TRUE(IsRefused(Exchange(AcquireBearer()), "wsse:SecurityTokenUnavailable",
                         "a bearer token has no key that could have signed the message"));
 }
@@ -95,7 +96,7 @@ TEST_F(RefusedTokens, ExchangeWithoutSignature) {
                         "the message presents a token or certificate and is not signed"));
 }
 
-TEST_F(RefusedTokens, ExchangeThatNamesAnotherTokensKey) {
+TEST_F(RefusedTokens, ExchangeWithAReferenceToAnotherTokensKey) {
   SsoClient::Request request;
   BuilderFor(m_service, "client").BuildExchangeTokenRequest(Acquire(), PlainSpec(), request);
   request.body = Replaced(request.body, "#SAMLID\">_", "#SAMLID\">_0");
@@ -110,7 +111,7 @@ TEST_F(RefusedTokens, DelegationOfATokenThatIsNotDelegable) {
                         "the presented token may not be delegated"));
 }
 
-// The genuine token stands in the message too, where nobody looks, and its signature holds.
+// The genuine token is also in the message, at a place that the service does not read, and its signature is valid.
 TEST_F(RefusedTokens, ExchangeOfATokenWrappedInAForgedOne) {
   const Testing::TokenStandIn genuine = Acquire();
   std::string forged = Replaced(genuine.ToXml(), genuine.GetId(), "_forged");
@@ -168,7 +169,7 @@ TEST_F(RefusedTokens, EleventhRenewal) {
   EXPECT_TRUE(IsRefused(Renew(token), "wst:UnableToRenew", "the token is not renewable"));
 }
 
-TEST_F(RefusedTokens, ValidationSaysInvalidOfEachOfThem) {
+TEST_F(RefusedTokens, ValidationReportsEachOfThemAsInvalid) {
   EXPECT_EQ(Validate(Acquire("expired-token")), INVALID);
   EXPECT_EQ(Validate(Acquire("early-token")), INVALID);
   EXPECT_EQ(Validate(Acquire("wrong-signer")), INVALID);

@@ -1,5 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
-// What acquire prints, whole, and what the service's every answer makes of it.
+// What acquire prints, asserted whole, for every kind of answer of the service.
 
 #include "expect_result.h"
 #include "service_test.h"
@@ -145,7 +145,7 @@ constexpr const char *CLIENT_JSON = R"({
 }
 )";
 
-/// The seconds since the epoch of a text as the tool writes it, without its fraction.
+/// The seconds since the epoch of a date in the tool's output, without the fraction.
 std::time_t SecondsOf(const std::string &text) {
   std::tm fields = {};
   std::istringstream(text) >> std::get_time(&fields, "%Y-%m-%dT%H:%M:%S");
@@ -209,7 +209,7 @@ TEST_F(Acquire, InExchangeDelegatesTheToken) {
                                     AttributeIn(m_folder.Read("second.xml"), "DelegationInstant") + "\n"));
 }
 
-TEST_F(Acquire, TakesAnIdentityFromAKeyStoreAndAnEncryptedKey) {
+TEST_F(Acquire, ReadsAnIdentityFromAKeyStoreAndAnEncryptedKey) {
   Run("openssl pkcs12 -export -in client.pem -inkey client.key -passout pass:'open sesame' -out client.p12");
   Run("openssl pkcs8 -topk8 -in client.key -passout pass:'open sesame' -out encrypted.key");
   m_folder.Write("passphrase.txt", "open sesame\n");
@@ -230,7 +230,7 @@ TEST_F(Acquire, ReadsPasswordAndPassphraseFromOneScript) {
   EXPECT_THAT(result.out, HasSubstr("\nConfirmation:    holder-of-key\n"));
 }
 
-TEST_F(Acquire, GivesTheTokenItselfOnStandardOutput) {
+TEST_F(Acquire, WritesTheTokenItselfToStandardOutput) {
   for (const char *options : {"--format xml", "--out -", "--out - --format xml"}) {
     const Result result = Run("ssoclient acquire " + Service() + PASSWORD + options + " >token.xml");
     ExpectResult(result, 0, "", "");
@@ -238,12 +238,12 @@ TEST_F(Acquire, GivesTheTokenItselfOnStandardOutput) {
   }
 }
 
-TEST_F(Acquire, WritesTheTokenToTheFileAloneWhenTheFormatIsXml) {
+TEST_F(Acquire, WritesTheTokenOnlyToTheFileWhenTheFormatIsXml) {
   ExpectResult(Run("ssoclient acquire " + Service() + PASSWORD + "--format xml --out token.xml"), 0, "", "");
   EXPECT_EQ(0, Run("ssoclient verify --trust sts.pem token.xml").exitCode);
 }
 
-TEST_F(Acquire, TakesTheServersThumbprintInPlaceOfAnAuthority) {
+TEST_F(Acquire, AcceptsTheServersThumbprintInsteadOfAnAuthority) {
   std::string withColons = m_service.GetThumbprint();
   for (std::size_t at = 2; at < withColons.size(); at += 3) {
     withColons.insert(at, ":");
@@ -256,7 +256,7 @@ TEST_F(Acquire, TakesTheServersThumbprintInPlaceOfAnAuthority) {
   EXPECT_THAT(wrong.err, StartsWith("ssoclient: communication failed: "));
 }
 
-TEST_F(Acquire, TrustsNoServerThatTheAuthoritiesDoNotVouchFor) {
+TEST_F(Acquire, RefusesAServerWhoseCertificateTheAuthoritiesDidNotIssue) {
   for (const char *authority : {"", "--ca client.pem "}) {
     const Result result =
         Run("ssoclient acquire --sts " + m_service.GetUrl() + " --trust sts.pem " + authority + PASSWORD);
@@ -267,7 +267,7 @@ TEST_F(Acquire, TrustsNoServerThatTheAuthoritiesDoNotVouchFor) {
   }
 }
 
-TEST_F(Acquire, HoldsAnIssuedTokenToANarrowerTolerance) {
+TEST_F(Acquire, ChecksAnIssuedTokenWithANarrowerTolerance) {
   const std::string line = "ssoclient acquire " + Service() + PASSWORD + "--lifetime 1h --out token.xml ";
   const Result result = Run(line + "--tolerance -3600");
   EXPECT_EQ(5, result.exitCode);
@@ -279,7 +279,7 @@ TEST_F(Acquire, HoldsAnIssuedTokenToANarrowerTolerance) {
 
 constexpr const char *OPERATION = "[0-9a-f]{8}(-[0-9a-f]{4}){3}-[0-9a-f]{12}";
 
-TEST_F(Acquire, ShowsTheLibrarysLogAndNoSecretInIt) {
+TEST_F(Acquire, ShowsTheLibrarysLogWithoutSecrets) {
   const Result result = Run("ssoclient acquire -v " + Service() + PASSWORD + "--format xml");
   EXPECT_EQ(0, result.exitCode);
   std::istringstream lines(result.err);
@@ -301,7 +301,7 @@ TEST_F(Acquire, ShowsTheLibrarysLogAndNoSecretInIt) {
   EXPECT_THAT(result.err, Not(HasSubstr("saml:")));
 }
 
-TEST_F(Acquire, ShowsThePasswordInNoFailure) {
+TEST_F(Acquire, ShowsNoPasswordInAFailure) {
   m_folder.Write("wrong.txt", "l00king-glass\n");
   for (const char *fault : {"", "reset", "bad-status", "garbled-xml", "soap-fault-Unknown"}) {
     const Result result = Run("ssoclient acquire -v --format json " + Service(fault) +
@@ -319,7 +319,7 @@ struct Answer {
   int exitCode;
   const char *exceptionClass;
   const char *label;
-  const char *message; ///< holds nothing that JSON escapes
+  const char *message; ///< contains nothing that JSON escapes
 };
 
 const Answer ANSWERS[] = {
@@ -406,7 +406,7 @@ TEST_F(Acquire, RefusesATokenThatIsNotSigned) {
   EXPECT_EQ(0u, m_folder.Names().count("token.xml"));
 }
 
-TEST_F(Acquire, RefusesATokenThatTheServiceIssuesOutOfDate) {
+TEST_F(Acquire, RefusesAnIssuedTokenThatIsOutOfDate) {
   for (const char *fault : {"expired-token", "early-token"}) {
     const Result result = Run("ssoclient acquire --format json " + Service(fault) + PASSWORD + "--out token.xml");
     EXPECT_EQ(8, result.exitCode);

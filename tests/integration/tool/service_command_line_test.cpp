@@ -25,7 +25,7 @@ struct Refusal {
   int exitCode;
   const char *exceptionClass;
   const char *label;
-  const char *message; ///< as in text; of what JSON escapes, it holds double quotes alone
+  const char *message; ///< as in text; of the characters that JSON escapes, it contains only double quotes
 };
 
 #define STS "--sts https://127.0.0.1:9/sts --trust sts-rsa.crt "
@@ -186,7 +186,7 @@ const Refusal REFUSALS[] = {
 
 class ServiceRefusal : public testing::TestWithParam<Refusal> {
 protected:
-  // Without a terminal, so that a run that should have been refused does not ask whoever runs the tests.
+  // Without a terminal, so that a run that is not refused as expected does not prompt at the terminal of the tests.
   static Result Run(const std::string &more) {
     return RunShell(std::string("setsid -w ssoclient ") + GetParam().commandLine + more);
   }
@@ -234,7 +234,7 @@ std::string WithColons(const std::string &digits) {
   return text;
 }
 
-TEST(Thumbprint, IsTakenWithAllColonsOrWithNone) {
+TEST(Thumbprint, IsAcceptedWithAllColonsOrWithNone) {
   const ClosedPort port;
   for (const std::string &thumbprint : {std::string(THUMBPRINT), WithColons(THUMBPRINT)}) {
     ExpectResult(RunShell("ssoclient validate --trust sts-rsa.crt --sts https://" + port.HostAndPort() +
@@ -261,7 +261,7 @@ TEST(Thumbprint, OfAnyOtherFormIsAWrongCommandLine) {
   }
 }
 
-TEST(ServiceCommandLine, AsksForNoVerdictInXml) {
+TEST(ServiceCommandLine, RefusesAVerdictInXml) {
   ExpectResult(RunShell("ssoclient validate " STS "--format xml bearer.xml"), 2, "",
                "ssoclient: usage: a verdict has no XML form; give --format text or json\n");
 }

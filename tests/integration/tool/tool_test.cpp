@@ -1,5 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
-// What the tool prints and how it ends, whole.
+// What the tool prints, asserted whole, and how it ends.
 
 #include "expect_result.h"
 #include "process.h"
@@ -48,7 +48,7 @@ Certificate:     CN=holder,O=Example
                  SHA-256 @HOLDER_SHA256@
 )";
 
-/// The thumbprint of the fixtures' holder, which is made anew when the fixtures are.
+/// The thumbprint of the fixtures' holder, which changes when the fixtures are made again.
 std::string HolderSha256() {
   const Result result = RunShell(
       "openssl x509 -in holder.crt -noout -fingerprint -sha256 | sed 's/.*=//;s/://g' | tr -d '\\n' | tr A-F a-f");
@@ -168,7 +168,7 @@ std::string Json(std::string text, bool verified) {
   return text.replace(text.find(mark), mark.size(), verified ? "true" : "false");
 }
 
-/// A file of its own that is gone at the end.
+/// A file that is deleted at the end.
 class TemporaryFile {
 public:
   explicit TemporaryFile(const std::string &content)
@@ -199,7 +199,7 @@ TEST(Verify, ShowsATokenWithoutOptionalPartsAsJson) {
                Json(MINIMAL_JSON, true), "");
 }
 
-TEST(Verify, GivesTheTokenItselfAsXml) {
+TEST(Verify, PrintsTheTokenItselfAsXml) {
   ExpectResult(RunTool({"verify", "--format", "xml", "--trust", "sts-rsa.crt", "style-pretty.xml"}), 0,
                ReadDataFile("tokens/style-pretty.xml"), "");
 }
@@ -210,7 +210,7 @@ TEST(Verify, ReadsStandardInputForADash) {
       0, Json(MINIMAL_JSON, true), "");
 }
 
-TEST(Verify, TakesTheKeysOfAllTrustFiles) {
+TEST(Verify, TrustsTheKeysOfAllTrustFiles) {
   EXPECT_EQ(
       0, RunTool({"verify", "--trust", "sts-rsa.crt", "--trust", "sts-ec256.crt", "ecdsa-p256-sha256.xml"}).exitCode);
   EXPECT_EQ(0, RunTool({"verify", "--trust", "sts-bundle.pem", "signed-by-second.xml"}).exitCode);
@@ -236,8 +236,8 @@ TEST(Verify, WarnsInJsonOnlyWhenAskedTo) {
   ExpectResult(RunTool(verbose), 0, Json(MINIMAL_JSON, true), EXPIRED_WARNING);
 }
 
-TEST(Verify, TakesTheTolerance) {
-  // 2021-01-01 is not 200 years ago for a long time to come.
+TEST(Verify, AppliesTheTolerance) {
+  // The token expired on 2021-01-01; the tolerance is 200 years.
   EXPECT_EQ(0, RunTool({"verify", "--tolerance", "6307200000", "--trust", "sts-rsa.crt", "expired.xml"}).exitCode);
   EXPECT_EQ(5, RunTool({"verify", "--tolerance", "-6307200000", "--trust", "sts-rsa.crt", "bearer.xml"}).exitCode);
 }
@@ -248,7 +248,7 @@ struct Refusal {
   int exitCode;
   const char *exceptionClass;
   const char *label;
-  const char *message; ///< as in text; it holds nothing that JSON escapes
+  const char *message; ///< as in text; contains nothing that JSON escapes
 };
 
 const Refusal REFUSALS[] = {
@@ -366,21 +366,21 @@ TEST(Inspect, ShowsTokensThatWouldBeRefusedForDatesOrSignature) {
   }
 }
 
-TEST(Inspect, RefusesWhatIsNotOfTheFormOfAToken) {
+TEST(Inspect, RefusesADocumentThatIsNotAToken) {
   ExpectResult(RunTool({"inspect", "../attacks/split-comment.xml"}), 5, "",
                "ssoclient: token invalid: Element 'saml:NameID' must only have textual content (but has extra children "
                "or is empty).\n");
 }
 
-TEST(Inspect, ReadsStandardInputAndGivesXmlAsItCame) {
+TEST(Inspect, ReadsStandardInputAndPrintsXmlUnchanged) {
   const std::string token = ReadDataFile("tokens/style-pretty.xml");
   ExpectResult(RunTool({"inspect", "--format", "xml", "-"}, token), 0, token, "");
 }
 
-TEST(Inspect, ShowsControlCharactersInsteadOfObeyingThem) {
+TEST(Inspect, EscapesControlCharacters) {
   std::string token = ReadDataFile("tokens/bearer-minimal.xml");
   const std::string alice = ">alice@";
-  // A line feed that would feign a line, the C1 control that starts terminal sequences, and a turn of direction.
+  // A line feed that would fake a line, the C1 control that starts terminal sequences, and a change of direction.
   token.replace(token.find(alice), alice.size(), ">a\nVerified: yes\xC2\x9B\xE2\x80\xAE\xF0\x9F\x99\x82\xC3\xA9@");
   const TemporaryFile file(token);
   const Result text = RunTool({"inspect", file.Path()});
@@ -393,8 +393,8 @@ TEST(Inspect, ShowsControlCharactersInsteadOfObeyingThem) {
       << json.out;
 }
 
-TEST(Tool, ShowsControlCharactersBehindOctetsThatAreNoUtf8) {
-  // Each lead octet announces more than follows, and must not take the escape character for a part of it.
+TEST(Tool, EscapesControlCharactersAfterOctetsThatAreNotUtf8) {
+  // Each lead octet announces more octets than follow. The escape character must not count as one of them.
   const std::string name = "missing\xC3\x1B[2J\xE2\x80\x1B[2J\xF0\x1B[2J\xF0\x9F\x1B";
   ExpectResult(RunTool({"inspect", name}), 7, "",
                "ssoclient: file: missing\xC3\\u001B[2J\xE2\\u0080\\u001B[2J\xF0\\u001B[2J\xF0\\u009F\\u001B: "
@@ -402,7 +402,7 @@ TEST(Tool, ShowsControlCharactersBehindOctetsThatAreNoUtf8) {
 }
 
 TEST(Tool, RefusesADocumentBeyondTheLimitWithoutReadingItAll) {
-  // Twice the limit; what is beyond it is not read, and the feeding end may break.
+  // Twice the limit. The tool does not read all of it, so that writing the rest may fail.
   const Result result = RunTool({"inspect", "-"}, "<x>" + std::string(32u * 1024 * 1024, 'a'));
   EXPECT_EQ(5, result.exitCode);
   EXPECT_EQ("", result.out);
@@ -424,15 +424,15 @@ TEST(Tool, LeavesAnIgnoredInterruptIgnored) {
                Json(MINIMAL_JSON, false), "");
 }
 
-TEST(Tool, SaysItsVersion) {
+TEST(Tool, PrintsItsVersion) {
   ExpectResult(RunTool({"--version"}), 0, "ssoclient " SSOCLIENT_VERSION "\n", "");
 }
 
-TEST(Tool, WantsACommand) {
+TEST(Tool, RequiresACommand) {
   ExpectResult(RunTool({}), 2, "", "ssoclient: usage: A subcommand is required; see ssoclient --help\n");
 }
 
-TEST(Tool, NamesAnUnknownCommandOrOption) {
+TEST(Tool, ReportsAnUnknownCommandOrOption) {
   ExpectResult(RunTool({"bogus", "token.xml"}), 2, "",
                "ssoclient: usage: unknown command or option 'bogus'; see ssoclient --help\n");
   ExpectResult(RunTool({"--bogus"}), 2, "",
@@ -465,7 +465,7 @@ TEST(Tool, ListsItsCommandsAndExitCodesInTheHelp) {
 )"));
 }
 
-// A line of a terminal, and a value of 15 MiB: text for people is cut, JSON for programs is whole.
+// A value of 15 MiB is cut in text, which people read, and whole in JSON, which programs read.
 
 const std::string LONG_VALUE(15u * 1024 * 1024, 'x');
 
@@ -487,7 +487,7 @@ TEST(LongValues, AreCutInALineAboutAFailureAndWholeInItsJson) {
   EXPECT_NE(std::string::npos, json.err.find(LONG_VALUE));
 }
 
-TEST(LongValues, AreCutAfterTheyWereEscaped) {
+TEST(LongValues, AreCutAfterTheyHaveBeenEscaped) {
   std::string token = ReadDataFile("tokens/bearer.xml");
   const std::string method = "urn:oasis:names:tc:SAML:2.0:cm:bearer";
   std::string tabs;
