@@ -5,6 +5,8 @@
 #include "service_test.h"
 #include "token_values.h"
 
+#include "support/data_file.h"
+
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
 
@@ -21,129 +23,10 @@ namespace {
 using testing::HasSubstr;
 using testing::MatchesRegex;
 using testing::Not;
+using Testing::ReadDataFile;
 using testing::StartsWith;
 
 class Acquire : public ServiceTest {};
-
-constexpr const char *ALICE_TEXT = R"(Verified:        yes
-Id:              @ID@
-Subject:         alice@corp.example
-First name:      Alice
-Last name:       Liddell
-Confirmation:    bearer
-Not before:      @NOT_BEFORE@
-Not on or after: @NOT_ON_OR_AFTER@
-Renewable:       no
-Delegable:       no
-Solution:        no
-Group:           corp.example\admins
-Group:           corp.example\users
-)";
-
-constexpr const char *EVERYTHING_JSON = R"({
-  "schema": 1,
-  "verified": true,
-  "id": "@ID@",
-  "subject": {
-    "name": "alice",
-    "domain": "corp.example"
-  },
-  "confirmation": "bearer",
-  "notBefore": "@NOT_BEFORE@",
-  "notOnOrAfter": "@NOT_ON_OR_AFTER@",
-  "renewable": true,
-  "delegable": true,
-  "solution": false,
-  "fullName": {
-    "first": "Alice",
-    "last": "Liddell"
-  },
-  "groups": [
-    {
-      "name": "admins",
-      "domain": "corp.example"
-    },
-    {
-      "name": "users",
-      "domain": "corp.example"
-    }
-  ],
-  "delegation": [
-    {
-      "name": "bob",
-      "domain": "corp.example",
-      "instant": "@DELEGATION_INSTANT@"
-    }
-  ],
-  "audience": [
-    "https://files.corp.example/",
-    "https://mail.corp.example/"
-  ],
-  "advice": [
-    {
-      "source": "urn:corp.example:mapper",
-      "attributes": [
-        {
-          "name": "color",
-          "values": [
-            "green",
-            "a=b:c"
-          ]
-        },
-        {
-          "name": "urn:corp.example:size",
-          "values": [
-            "10"
-          ]
-        }
-      ]
-    },
-    {
-      "source": "audit",
-      "attributes": [
-        {
-          "name": "by",
-          "values": [
-            "\u00e9\\"
-          ]
-        }
-      ]
-    }
-  ],
-  "certificate": null,
-  "unmet": []
-}
-)";
-
-constexpr const char *CLIENT_JSON = R"({
-  "schema": 1,
-  "verified": true,
-  "id": "@ID@",
-  "subject": {
-    "name": "client",
-    "domain": "corp.example"
-  },
-  "confirmation": "holder-of-key",
-  "notBefore": "@NOT_BEFORE@",
-  "notOnOrAfter": "@NOT_ON_OR_AFTER@",
-  "renewable": false,
-  "delegable": false,
-  "solution": true,
-  "fullName": {
-    "first": "",
-    "last": ""
-  },
-  "groups": [],
-  "delegation": [],
-  "audience": [],
-  "advice": [],
-  "certificate": {
-    "subject": "CN=client,O=corp.example",
-    "sha256": "@SHA256@"
-  },
-  "unmet": []
-}
-)";
 
 /// The seconds since the epoch of a date in the tool's output, without the fraction.
 std::time_t SecondsOf(const std::string &text) {
@@ -154,7 +37,7 @@ std::time_t SecondsOf(const std::string &text) {
 
 TEST_F(Acquire, ByPasswordShowsTheTokenAsText) {
   const Result result = Run("ssoclient acquire " + Service() + PASSWORD + "--out token.xml");
-  ExpectResult(result, 0, FillFrom(m_folder.Read("token.xml"), ALICE_TEXT), "");
+  ExpectResult(result, 0, FillFrom(m_folder.Read("token.xml"), ReadDataFile("tool/acquired_by_password.txt")), "");
 }
 
 TEST_F(Acquire, AsksForEveryPropertyAndShowsTheTokenAsJson) {
@@ -165,8 +48,8 @@ TEST_F(Acquire, AsksForEveryPropertyAndShowsTheTokenAsJson) {
           "--advice audit:by='\xC3\xA9\\\\' --advice 'urn:corp.example:mapper:urn\\:corp.example\\:size=10' "
           "--advice urn:corp.example:mapper:color=a=b:c --format json --out token.xml");
   const std::string xml = m_folder.Read("token.xml");
-  const std::string expected =
-      Fill(FillFrom(xml, EVERYTHING_JSON), "@DELEGATION_INSTANT@", AttributeIn(xml, "DelegationInstant"));
+  const std::string expected = Fill(FillFrom(xml, ReadDataFile("tool/acquired_with_everything.json")),
+                                    "@DELEGATION_INSTANT@", AttributeIn(xml, "DelegationInstant"));
   ExpectResult(result, 0, expected, "");
   const std::string conditions = xml.substr(xml.find("Conditions "));
   EXPECT_EQ(90 * 60,
@@ -185,7 +68,10 @@ TEST_F(Acquire, ByIdentityAloneBindsTheTokenToTheKey) {
   const Result result = Run("ssoclient acquire " + Service() + IDENTITY + "--format json --out token.xml");
   const Result thumbprint = Run("openssl x509 -in client.pem -noout -fingerprint -sha256 | sed 's/.*=//;s/://g' | "
                                 "tr -d '\\n' | tr A-F a-f");
-  ExpectResult(result, 0, Fill(FillFrom(m_folder.Read("token.xml"), CLIENT_JSON), "@SHA256@", thumbprint.out), "");
+  ExpectResult(result, 0,
+               Fill(FillFrom(m_folder.Read("token.xml"), ReadDataFile("tool/acquired_by_identity.json")), "@SHA256@",
+                    thumbprint.out),
+               "");
 }
 
 TEST_F(Acquire, ByPasswordBindsTheTokenToTheIdentityUnlessABearerTokenIsAskedFor) {
@@ -329,7 +215,7 @@ const Answer ANSWERS[] = {
      "credentials refused", "Authentication failed: unknown user or wrong password"},
     {"UnknownIdentity", "", "--cert foreign.pem --key foreign.key ", 3, "InvalidCredentialsException",
      "credentials refused",
-     "Authentication failed: the certificate is none that the service's authority gave a client"},
+     "Authentication failed: the certificate is not a client certificate of the service's authority"},
     {"FailedAuthentication", "soap-fault-FailedAuthentication", PASSWORD, 3, "InvalidCredentialsException",
      "credentials refused", "Authentication failed: a fault was asked for"},
     {"BrokenConnection", "reset", PASSWORD, 4, "CommunicationException", "communication failed",

@@ -3,6 +3,7 @@
 
 #include "expect_result.h"
 #include "process.h"
+#include "token_values.h"
 
 #include "support/data_file.h"
 
@@ -12,6 +13,7 @@
 #include <filesystem>
 #include <fstream>
 #include <string>
+#include <utility>
 #include <vector>
 
 #include <unistd.h>
@@ -21,33 +23,6 @@ namespace {
 
 using Testing::ReadDataFile;
 
-constexpr const char *FULL_TEXT = R"(Id:              _a18b869b-2e81-c0c5-2955-2a3c4fa5c92e
-Subject:         alice@corp.example
-First name:      Alice
-Last name:       Liddell
-Confirmation:    holder-of-key
-Not before:      2020-01-01T00:00:00.000Z
-Not on or after: 2120-01-01T00:00:00.000Z
-Renewable:       yes
-Delegable:       yes
-Solution:        yes
-Group:           corp.example\Administrators
-Group:           corp.example\Users
-Group:           corp.example\Ops\Night Shift
-Delegate:        gateway@corp.example at 2020-01-01T00:00:01.250Z
-Delegate:        backup@corp.example at 2020-01-01T00:00:02.000Z
-Audience:        https://files.corp.example/
-Audience:        https://mail.corp.example/
-Advice:          urn:corp.example:mapper
-                 urn:corp.example:advice:color
-                 = green
-                 = blue
-                 urn:corp.example:advice:empty
-Advice:          urn:corp.example:audit
-Certificate:     CN=holder,O=Example
-                 SHA-256 @HOLDER_SHA256@
-)";
-
 /// The thumbprint of the fixtures' holder, which changes when the fixtures are made again.
 std::string HolderSha256() {
   const Result result = RunShell(
@@ -55,117 +30,15 @@ std::string HolderSha256() {
   return result.out;
 }
 
-std::string WithHolder(std::string text) {
+/// The expected output in tests/data/tool, with the thumbprint filled in.
+std::string Expected(const std::string &file) {
+  std::string text = ReadDataFile("tool/" + file);
   const std::string mark = "@HOLDER_SHA256@";
-  return text.replace(text.find(mark), mark.size(), HolderSha256());
+  return text.find(mark) == std::string::npos ? text : Fill(std::move(text), mark, HolderSha256());
 }
 
-constexpr const char *MINIMAL_JSON = R"({
-  "schema": 1,
-  "verified": @VERIFIED@,
-  "id": "_6786bdef-ac00-81c1-bcc9-518978be1746",
-  "subject": {
-    "name": "alice",
-    "domain": "corp.example"
-  },
-  "confirmation": "bearer",
-  "notBefore": "2020-01-01T00:00:00.000Z",
-  "notOnOrAfter": "2120-01-01T00:00:00.000Z",
-  "renewable": false,
-  "delegable": false,
-  "solution": false,
-  "fullName": {
-    "first": "",
-    "last": ""
-  },
-  "groups": [],
-  "delegation": [],
-  "audience": [],
-  "advice": [],
-  "certificate": null
-}
-)";
-
-constexpr const char *FULL_JSON = R"({
-  "schema": 1,
-  "verified": @VERIFIED@,
-  "id": "_a18b869b-2e81-c0c5-2955-2a3c4fa5c92e",
-  "subject": {
-    "name": "alice",
-    "domain": "corp.example"
-  },
-  "confirmation": "holder-of-key",
-  "notBefore": "2020-01-01T00:00:00.000Z",
-  "notOnOrAfter": "2120-01-01T00:00:00.000Z",
-  "renewable": true,
-  "delegable": true,
-  "solution": true,
-  "fullName": {
-    "first": "Alice",
-    "last": "Liddell"
-  },
-  "groups": [
-    {
-      "name": "Administrators",
-      "domain": "corp.example"
-    },
-    {
-      "name": "Users",
-      "domain": "corp.example"
-    },
-    {
-      "name": "Ops\\Night Shift",
-      "domain": "corp.example"
-    }
-  ],
-  "delegation": [
-    {
-      "name": "gateway",
-      "domain": "corp.example",
-      "instant": "2020-01-01T00:00:01.250Z"
-    },
-    {
-      "name": "backup",
-      "domain": "corp.example",
-      "instant": "2020-01-01T00:00:02.000Z"
-    }
-  ],
-  "audience": [
-    "https://files.corp.example/",
-    "https://mail.corp.example/"
-  ],
-  "advice": [
-    {
-      "source": "urn:corp.example:mapper",
-      "attributes": [
-        {
-          "name": "urn:corp.example:advice:color",
-          "values": [
-            "green",
-            "blue"
-          ]
-        },
-        {
-          "name": "urn:corp.example:advice:empty",
-          "values": []
-        }
-      ]
-    },
-    {
-      "source": "urn:corp.example:audit",
-      "attributes": []
-    }
-  ],
-  "certificate": {
-    "subject": "CN=holder,O=Example",
-    "sha256": "@HOLDER_SHA256@"
-  }
-}
-)";
-
-std::string Json(std::string text, bool verified) {
-  const std::string mark = "@VERIFIED@";
-  return text.replace(text.find(mark), mark.size(), verified ? "true" : "false");
+std::string ExpectedJson(const std::string &file, bool verified) {
+  return Fill(Expected(file), "@VERIFIED@", verified ? "true" : "false");
 }
 
 /// A file that is deleted at the end.
@@ -186,17 +59,17 @@ private:
 
 TEST(Verify, ShowsAVerifiedTokenAsText) {
   ExpectResult(RunTool({"verify", "--trust", "sts-rsa.crt", "full.xml"}), 0,
-               "Verified:        yes\n" + WithHolder(FULL_TEXT), "");
+               "Verified:        yes\n" + Expected("full.txt"), "");
 }
 
 TEST(Verify, ShowsAVerifiedTokenAsJson) {
   ExpectResult(RunTool({"verify", "--format", "json", "--trust", "sts-rsa.crt", "full.xml"}), 0,
-               Json(WithHolder(FULL_JSON), true), "");
+               ExpectedJson("full.json", true), "");
 }
 
 TEST(Verify, ShowsATokenWithoutOptionalPartsAsJson) {
   ExpectResult(RunTool({"verify", "--format", "json", "--trust", "sts-rsa.crt", "bearer-minimal.xml"}), 0,
-               Json(MINIMAL_JSON, true), "");
+               ExpectedJson("minimal.json", true), "");
 }
 
 TEST(Verify, PrintsTheTokenItselfAsXml) {
@@ -207,7 +80,7 @@ TEST(Verify, PrintsTheTokenItselfAsXml) {
 TEST(Verify, ReadsStandardInputForADash) {
   ExpectResult(
       RunTool({"verify", "--format", "json", "--trust", "sts-rsa.crt", "-"}, ReadDataFile("tokens/bearer-minimal.xml")),
-      0, Json(MINIMAL_JSON, true), "");
+      0, ExpectedJson("minimal.json", true), "");
 }
 
 TEST(Verify, TrustsTheKeysOfAllTrustFiles) {
@@ -230,10 +103,10 @@ TEST(Verify, WarnsOfATrustedCertificateThatIsOutOfDateAndTrustsItsKey) {
 TEST(Verify, WarnsInJsonOnlyWhenAskedTo) {
   const std::vector<std::string> line = {
       "verify", "--format", "json", "--trust", "sts-rsa-expired.crt", "bearer-minimal.xml"};
-  ExpectResult(RunTool(line), 0, Json(MINIMAL_JSON, true), "");
+  ExpectResult(RunTool(line), 0, ExpectedJson("minimal.json", true), "");
   std::vector<std::string> verbose = line;
   verbose.push_back("-v");
-  ExpectResult(RunTool(verbose), 0, Json(MINIMAL_JSON, true), EXPIRED_WARNING);
+  ExpectResult(RunTool(verbose), 0, ExpectedJson("minimal.json", true), EXPIRED_WARNING);
 }
 
 TEST(Verify, AppliesTheTolerance) {
@@ -350,12 +223,13 @@ INSTANTIATE_TEST_SUITE_P(Of, VerifyRefusal, testing::ValuesIn(REFUSALS),
 
 TEST(Inspect, ShowsATokenAsTextAndSaysThatNothingWasChecked) {
   ExpectResult(RunTool({"inspect", "full.xml"}), 0,
-               "Verified:        no, nothing below was checked\n" + WithHolder(FULL_TEXT), "");
+               "Verified:        no, nothing below was checked\n" + Expected("full.txt"), "");
 }
 
 TEST(Inspect, NeverClaimsToVerify) {
-  ExpectResult(RunTool({"inspect", "--format", "json", "full.xml"}), 0, Json(WithHolder(FULL_JSON), false), "");
-  ExpectResult(RunTool({"inspect", "--format", "json", "bearer-minimal.xml"}), 0, Json(MINIMAL_JSON, false), "");
+  ExpectResult(RunTool({"inspect", "--format", "json", "full.xml"}), 0, ExpectedJson("full.json", false), "");
+  ExpectResult(RunTool({"inspect", "--format", "json", "bearer-minimal.xml"}), 0, ExpectedJson("minimal.json", false),
+               "");
 }
 
 TEST(Inspect, ShowsTokensThatWouldBeRefusedForDatesOrSignature) {
@@ -421,7 +295,7 @@ TEST(Tool, EndsWith130WhenInterrupted) {
 
 TEST(Tool, LeavesAnIgnoredInterruptIgnored) {
   ExpectResult(RunShell("trap '' INT; ssoclient inspect --format json bearer-minimal.xml & wait $!"), 0,
-               Json(MINIMAL_JSON, false), "");
+               ExpectedJson("minimal.json", false), "");
 }
 
 TEST(Tool, PrintsItsVersion) {

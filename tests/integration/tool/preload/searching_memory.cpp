@@ -7,6 +7,7 @@
 #include <cstdlib>
 #include <cstring>
 #include <fstream>
+#include <sstream>
 #include <string>
 
 namespace {
@@ -42,11 +43,13 @@ struct SearchAtTheEnd {
     int count = 0;
     std::ifstream maps("/proc/self/maps");
     for (std::string line; std::getline(maps, line);) {
-      unsigned long begin = 0;
-      unsigned long end = 0;
-      char access[5] = {};
-      if (std::sscanf(line.c_str(), "%lx-%lx %4s", &begin, &end, access) == 3 && std::strncmp(access, "rw", 2) == 0) {
-        count += CountIn(reinterpret_cast<const char *>(begin), reinterpret_cast<const char *>(end), reversed);
+      std::istringstream fields(line);
+      void *begin = nullptr;
+      void *end = nullptr;
+      char dash = 0;
+      std::string access;
+      if (fields >> begin >> dash >> end >> access && access.compare(0, 2, "rw") == 0) {
+        count += CountIn(static_cast<const char *>(begin), static_cast<const char *>(end), reversed);
       }
     }
     std::fprintf(stderr, "found %d times\n", count);
