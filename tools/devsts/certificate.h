@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// X.509 certificates and their keys, as OpenSSL holds them.
+/// X.509 certificates and their keys, in OpenSSL's types.
 
 #pragma once
 

@@ -240,7 +240,7 @@ void Connection::Reset() {
   socket.close(ignored);
 }
 
-/// Never answers; ends when the client gives up.
+/// Never answers; ends when the client closes the connection.
 void Connection::AwaitPeer() {
   m_stream.next_layer().expires_never();
   m_buffer.clear();

@@ -226,6 +226,43 @@ void RemoveEnvelope(xmlDoc &response, xmlNode &body) {
   xmlFreeNode(envelope);
 }
 
+/// Applies the faults that change the tree of the response.
+void CorruptTree(xmlDoc &response, DocumentFault fault) {
+  xmlNode *const root = xmlDocGetRootElement(&response);
+  switch (fault) {
+  case DocumentFault::NO_TOKEN:
+    Empty(FindBelow(root, "RequestedSecurityToken"));
+    Empty(FindBelow(root, "Status"));
+    return;
+  case DocumentFault::WRONG_ELEMENT:
+    Rename(FindBelow(root, "RequestedSecurityToken"), "RequestedProofToken");
+    Rename(FindBelow(root, "Status"), "State");
+    return;
+  case DocumentFault::WRONG_ROOT:
+    RemoveEnvelope(response, RequireChild(*root, Ns::SOAPENV, "Body"));
+    return;
+  case DocumentFault::WRONG_WRAPPER:
+    SwapWrapper(RequireChild(*root, Ns::SOAPENV, "Body"));
+    return;
+  case DocumentFault::WRONG_STATUS:
+    if (xmlNode *code = FindBelow(root, "Code")) {
+      SetText(*code, std::string(Ns::WST.uri) + "/status/unknown");
+    }
+    return;
+  case DocumentFault::NO_LEG:
+  case DocumentFault::GARBAGE_LEG:
+  case DocumentFault::NO_CONTEXT:
+  case DocumentFault::OTHER_CONTEXT:
+    CorruptLeg(root, fault);
+    return;
+  case DocumentFault::TOO_DEEP:
+    Deepen(RequireChild(*root, Ns::SOAPENV, "Body"));
+    return;
+  default:
+    return;
+  }
+}
+
 } // namespace
 
 std::optional<Fault> ParseFault(std::string_view name) {
@@ -327,50 +364,20 @@ void TamperWith(xmlDoc &token) {
 }
 
 std::string CorruptResponse(xmlDoc &response, DocumentFault fault) {
-  xmlNode *const root = xmlDocGetRootElement(&response);
+  CorruptTree(response, fault);
+  std::string text = Serialise(response);
   switch (fault) {
-  case DocumentFault::NO_TOKEN:
-    Empty(FindBelow(root, "RequestedSecurityToken"));
-    Empty(FindBelow(root, "Status"));
-    break;
-  case DocumentFault::WRONG_ELEMENT:
-    Rename(FindBelow(root, "RequestedSecurityToken"), "RequestedProofToken");
-    Rename(FindBelow(root, "Status"), "State");
-    break;
-  case DocumentFault::WRONG_ROOT:
-    RemoveEnvelope(response, RequireChild(*root, Ns::SOAPENV, "Body"));
-    break;
-  case DocumentFault::WRONG_WRAPPER:
-    SwapWrapper(RequireChild(*root, Ns::SOAPENV, "Body"));
-    break;
-  case DocumentFault::WRONG_STATUS:
-    if (xmlNode *code = FindBelow(root, "Code")) {
-      SetText(*code, std::string(Ns::WST.uri) + "/status/unknown");
-    }
-    break;
-  case DocumentFault::NO_LEG:
-  case DocumentFault::GARBAGE_LEG:
-  case DocumentFault::NO_CONTEXT:
-  case DocumentFault::OTHER_CONTEXT:
-    CorruptLeg(root, fault);
-    break;
-  case DocumentFault::GARBLED_XML: {
-    const std::string text = Serialise(response);
+  case DocumentFault::GARBLED_XML:
     return text.substr(0, text.rfind("</")) + "</garbled>";
-  }
   case DocumentFault::NOT_SOAP:
     return "<html><head><title>Welcome</title></head><body>It works!</body></html>";
   case DocumentFault::EMPTY_BODY:
     return {};
   case DocumentFault::DOCTYPE:
-    return "<!DOCTYPE Envelope>" + Serialise(response);
-  case DocumentFault::TOO_DEEP:
-    Deepen(RequireChild(*root, Ns::SOAPENV, "Body"));
-    break;
+    return "<!DOCTYPE Envelope>" + text;
   default:
-    break;
+    return text;
   }
-  return Serialise(response);
 }
 
 } // namespace DevSts

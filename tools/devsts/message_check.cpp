@@ -66,14 +66,14 @@ Envelope ReadEnvelope(const xmlDoc &document) {
   }
   const std::vector<xmlNode *> parts = ChildElements(root);
   if (parts.size() != 2 || !IsElement(*parts[0], Ns::SOAPENV, "Header") || !IsElement(*parts[1], Ns::SOAPENV, "Body")) {
-    throw Refusal(Code::CLIENT, "an envelope must hold one header and one body");
+    throw Refusal(Code::CLIENT, "an envelope must contain one header and one body");
   }
   const std::vector<xmlNode *> headers = ChildElements(*parts[0]);
   if (headers.size() != 1 || !IsElement(*headers[0], Ns::WSSE, "Security")) {
     RefuseSecurity("the message must have one security header and no other");
   }
   if (ChildElements(*parts[1]).size() != 1) {
-    throw Refusal(Code::INVALID_REQUEST, "the body must hold one element");
+    throw Refusal(Code::INVALID_REQUEST, "the body must contain one element");
   }
   return {parts[1], ReadSecurityHeader(*headers[0])};
 }
@@ -166,7 +166,7 @@ Certificate SignerCertificate(const Envelope &envelope, const CheckedMessage &me
     throw Refusal(Code::TOKEN_UNAVAILABLE, "unsupported key reference");
   }
   if (!certificate || !HasStrongKey(*certificate)) {
-    throw Refusal(Code::INVALID_TOKEN, "the signer's certificate must hold an RSA key of at least 2048 bits");
+    throw Refusal(Code::INVALID_TOKEN, "the signer's certificate must have an RSA key of at least 2048 bits");
   }
   return certificate;
 }

@@ -30,7 +30,16 @@ std::string Footer() {
          "  ssoclient-devsts --state DIR --charset ISO-8859-1\n"
          "      Reads requests as ISO-8859-1, as services do that get no charset, and answers in it.\n"
          "  ssoclient-devsts --state DIR --fault wrong-signer\n"
-         "      Signs every token with a key that nobody trusts.\n";
+         "      Signs every token with a key that no client trusts.\n";
+}
+
+/// @throws CLI::ValidationError for an unknown name
+Fault RequireFault(const std::string &name) {
+  const std::optional<Fault> fault = ParseFault(name);
+  if (!fault) {
+    throw CLI::ValidationError("--fault", "unknown fault '" + name + "'; see --help");
+  }
+  return *fault;
 }
 
 } // namespace
@@ -62,11 +71,7 @@ std::variant<Options, int> ReadOptions(int argc, char **argv) {
   try {
     app.parse(argc, argv);
     if (!faultName.empty()) {
-      const std::optional<Fault> fault = ParseFault(faultName);
-      if (!fault) {
-        throw CLI::ValidationError("--fault", "unknown fault '" + faultName + "'; see --help");
-      }
-      options.fault = *fault;
+      options.fault = RequireFault(faultName);
     }
   } catch (const CLI::Success &success) { // --help and --version
     return app.exit(success);

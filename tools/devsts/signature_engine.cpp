@@ -80,7 +80,7 @@ SignatureReference ReadReference(const xmlNode &reference) {
   SignatureReference result;
   result.id = uri.substr(uri.empty() ? 0 : 1);
   if (uri.rfind('#', 0) != 0 || !IsPlainIdentifier(result.id)) {
-    throw Refusal(Code::INVALID_SECURITY, "a signature may refer to elements of the message alone");
+    throw Refusal(Code::INVALID_SECURITY, "a signature may refer only to elements of the message");
   }
   std::vector<xmlNode *> transforms = ChildElements(*parts[0]);
   result.isEnveloped = transforms.size() == 2;

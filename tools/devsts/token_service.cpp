@@ -39,7 +39,7 @@ std::string ProofCertificate(const CheckedMessage &message, const TrustRequest &
   // A request for an exchange has no wst:UseKey: the key is the presented token's.
   const bool mayOmitUseKey = message.presentedToken.has_value();
   if (request.useKey ? *request.useKey != message.signatureId : !mayOmitUseKey) {
-    throw Refusal(Code::INVALID_REQUEST, "wst:UseKey does not name the message's signature");
+    throw Refusal(Code::INVALID_REQUEST, "wst:UseKey does not refer to the message's signature");
   }
   return EncodeCertificate(*message.signer);
 }
@@ -96,7 +96,7 @@ std::string UserOf(std::string principal) {
 std::string ReadContext(const xmlNode &request) {
   const std::optional<std::string> context = AttributeOf(request, "Context");
   if (!context || context->empty()) {
-    throw Refusal(Code::INVALID_REQUEST, "a leg of a negotiation must name its context");
+    throw Refusal(Code::INVALID_REQUEST, "a leg of a negotiation must have a context");
   }
   return *context;
 }
@@ -296,7 +296,8 @@ void TokenService::SetClient(TokenFacts &facts, const std::string &principal) co
 TokenFacts TokenService::FactsOfCertificate(X509 &certificate) const {
   const std::string principal = PrincipalOf(certificate);
   if (principal.empty() || !IsClientOf(certificate, *m_state.authority.certificate)) {
-    throw Refusal(Code::FAILED_AUTHENTICATION, "the certificate is none that the service's authority gave a client");
+    throw Refusal(Code::FAILED_AUTHENTICATION,
+                  "the certificate is not a client certificate of the service's authority");
   }
   TokenFacts facts;
   facts.subject = principal;

@@ -144,7 +144,7 @@ std::string TextOf(const xmlNode &element) {
   std::string text;
   for (const xmlNode *child = element.children; child; child = child->next) {
     if (child->type != XML_TEXT_NODE && child->type != XML_CDATA_SECTION_NODE) {
-      throw Refusal(Code::INVALID_REQUEST, ToString(element.name) + " must hold text alone");
+      throw Refusal(Code::INVALID_REQUEST, ToString(element.name) + " must contain only text");
     }
     text += ToString(child->content);
   }

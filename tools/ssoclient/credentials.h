@@ -43,8 +43,7 @@ struct AcquireCall {
 
 /// One row of the table of kinds.
 struct CredentialsKind {
-  const char
-      *option; ///< the option that chooses the kind; null for the identity alone, which needs no option of its own
+  const char *option; ///< the option that chooses the kind; null for the identity alone, which has no such option
   bool (*isChosen)(const CredentialsOptions &credentials);
 
   /// @throws UsageException when the rest of the command line contradicts the kind.

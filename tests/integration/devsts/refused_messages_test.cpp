@@ -156,7 +156,7 @@ TEST_F(Proof, KeyTypeChangedToHolderOfKey) {
 TEST_F(Proof, UseKeyThatRefersToAnotherSignature) {
   const std::string text = CertificateRequest(m_service).body;
   EXPECT_TRUE(IsRefused(SendText(Replaced(text, " Id=\"holderOfKeyProofSignature\"", " Id=\"otherSignature\"")),
-                        "wst:InvalidRequest", "wst:UseKey does not name the message's signature"));
+                        "wst:InvalidRequest", "wst:UseKey does not refer to the message's signature"));
 }
 
 using Malformed = RefusedMessages;
@@ -230,7 +230,7 @@ TEST_F(Malformed, NoSecurityHeader) {
 TEST_F(Malformed, EmptyBody) {
   EXPECT_TRUE(
       IsRefused(SendText(Without(PasswordRequest().body, "<wst:RequestSecurityToken ", "</wst:RequestSecurityToken>")),
-                "wst:InvalidRequest", "the body must hold one element"));
+                "wst:InvalidRequest", "the body must contain one element"));
 }
 
 TEST_F(Malformed, UnknownRequestType) {
@@ -252,7 +252,7 @@ TEST_F(Malformed, ActionOfAnotherOperation) {
 
 TEST_F(Malformed, CommentThatSplitsAText) {
   EXPECT_TRUE(IsRefused(SendCorrupted("alice@corp.example", "alice@corp.example<!-- -->.evil"), "wst:InvalidRequest",
-                        "Username must hold text alone"));
+                        "Username must contain only text"));
 }
 
 TEST_F(Malformed, ElementThatOccursTwice) {

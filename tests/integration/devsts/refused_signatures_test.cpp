@@ -111,7 +111,7 @@ TEST_F(RefusedSignatures, SignedBodyMovedAsideForAnotherBody) {
 
 TEST_F(RefusedSignatures, SecondBodyNextToTheSignedOne) {
   EXPECT_TRUE(IsRefused(SendCorrupted("<soapenv:Body ", "<soapenv:Body/><soapenv:Body "), "soapenv:Client",
-                        "an envelope must hold one header and one body"));
+                        "an envelope must contain one header and one body"));
 }
 
 TEST_F(RefusedSignatures, TimestampChangedAfterSigning) {
@@ -172,13 +172,13 @@ TEST_F(RefusedSignatures, KeyOfAnotherCertificate) {
 TEST_F(RefusedSignatures, CertificateOfAnotherAuthority) {
   EXPECT_TRUE(IsRefused(Send(m_service, CertificateRequest(m_service, PlainSpec(), "foreign")),
                         "wst:FailedAuthentication",
-                        "the certificate is none that the service's authority gave a client"));
+                        "the certificate is not a client certificate of the service's authority"));
 }
 
 TEST_F(RefusedSignatures, CertificateOfTheAuthorityThatIsNotForClients) {
   for (const char *name : {"signing", "tls", "authority"}) {
     EXPECT_TRUE(IsRefused(Send(m_service, CertificateRequest(m_service, PlainSpec(), name)), "wst:FailedAuthentication",
-                          "the certificate is none that the service's authority gave a client"))
+                          "the certificate is not a client certificate of the service's authority"))
         << name;
   }
 }
@@ -190,7 +190,7 @@ TEST_F(RefusedSignatures, KeyOf1024Bits) {
   SsoClient::Request request;
   SsoClient::RequestBuilderImpl(weak).BuildCertificateTokenRequest(PlainSpec(), request);
   EXPECT_TRUE(IsRefused(Send(m_service, request), "wsse:InvalidSecurityToken",
-                        "the signer's certificate must hold an RSA key of at least 2048 bits"));
+                        "the signer's certificate must have an RSA key of at least 2048 bits"));
 }
 
 TEST_F(RefusedSignatures, KeyReferenceToAnElementThatIsNotACertificate) {
@@ -201,12 +201,12 @@ TEST_F(RefusedSignatures, KeyReferenceToAnElementThatIsNotACertificate) {
 
 TEST_F(RefusedSignatures, ReferenceToAnotherDocument) {
   EXPECT_TRUE(IsRefused(SendCorrupted("<ds:Reference URI=\"#", "<ds:Reference URI=\"https://localhost/#"),
-                        "wsse:InvalidSecurity", "a signature may refer to elements of the message alone"));
+                        "wsse:InvalidSecurity", "a signature may refer only to elements of the message"));
 }
 
 TEST_F(RefusedSignatures, ReferenceThatIsAnXPointer) {
   EXPECT_TRUE(IsRefused(SendCorrupted("<ds:Reference URI=\"#", "<ds:Reference URI=\"#xpointer(/)"),
-                        "wsse:InvalidSecurity", "a signature may refer to elements of the message alone"));
+                        "wsse:InvalidSecurity", "a signature may refer only to elements of the message"));
 }
 
 TEST_F(RefusedSignatures, ReferenceToAMissingElement) {

@@ -184,9 +184,9 @@ TEST_F(ServiceOverTls, ReportsACertificateThatTheServiceDoesNotKnow) {
   const auto context = TrustingContext();
   SecurityTokenServiceConfig config = ConfigFor(*context, "", RunningService().GetUrl());
   config.holderOfKeyConfig = HolderIdentity();
-  EXPECT_THROWS_MESSAGE(CreateSecurityTokenService(config)->AcquireTokenByCertificate(SpecFor(60)),
-                        InvalidCredentialsException,
-                        "Authentication failed: the certificate is none that the service's authority gave a client");
+  EXPECT_THROWS_MESSAGE(
+      CreateSecurityTokenService(config)->AcquireTokenByCertificate(SpecFor(60)), InvalidCredentialsException,
+      "Authentication failed: the certificate is not a client certificate of the service's authority");
 }
 
 TEST_F(ServiceOverTls, ReportsARenewalOfATokenThatIsNotRenewable) {

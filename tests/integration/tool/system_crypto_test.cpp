@@ -29,8 +29,8 @@ TEST(SystemCrypto, IsNotUsedUnlessItIsAskedFor) {
 }
 
 TEST(SystemCrypto, IsUsedWhenItIsAskedFor) {
-  const Result good = RunConfigured("", "verify --system-crypto --trust sts-rsa.crt bearer.xml");
-  EXPECT_EQ(good.exitCode, 0) << good.err;
+  const Result accepted = RunConfigured("", "verify --system-crypto --trust sts-rsa.crt bearer.xml");
+  EXPECT_EQ(accepted.exitCode, 0) << accepted.err;
   const Result refused = RunConfigured(REFUSED_BY_OPENSSL, "verify --system-crypto --trust sts-rsa.crt bearer.xml");
   EXPECT_EQ(refused.exitCode, 7);
   EXPECT_EQ(refused.err.rfind("ssoclient: key or certificate: Cannot initialise OpenSSL: error:", 0), 0u)

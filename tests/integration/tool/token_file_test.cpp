@@ -70,14 +70,14 @@ TEST_F(TokenFile, ThatIsCreatedInTheMeantimeIsNotReplacedWithoutForce) {
       ShellCommand("exec ssoclient acquire " + Service() + "--user alice@corp.example --format xml --out token.xml"),
       m_folder.Path());
   session.WaitFor("Password for alice@corp.example: "); // by then the tool has seen that there is no such file
-  m_folder.Write("token.xml", "what came meanwhile");
+  m_folder.Write("token.xml", "from another program");
   session.Type("wonderland\n");
   EXPECT_EQ(7, session.Finish());
   EXPECT_EQ("Password for alice@corp.example: \r\n"
             "ssoclient: file: token.xml: already exists; --force replaces it\r\n",
             session.Shown());
   EXPECT_NE(std::string::npos, m_service.GetLog().find(": issued")) << m_service.GetLog();
-  EXPECT_EQ("what came meanwhile", m_folder.Read("token.xml"));
+  EXPECT_EQ("from another program", m_folder.Read("token.xml"));
   EXPECT_EQ(WithToken(), m_folder.Names());
 }
 
