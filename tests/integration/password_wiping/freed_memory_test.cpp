@@ -253,7 +253,7 @@ int CountFindsOfPosts(const char *secret, const Testing::ScriptedServer::Script 
 
 TEST_P(FreedMemory, ContainsNoPasswordOfARequestThatWasSent) {
   const auto answer = [](Testing::ServerConnection &connection) {
-    connection.ShakeHands();
+    connection.Handshake();
     connection.Write(Testing::Response("200 OK", "<answer/>"));
     connection.WaitForInterrupt();
   };
@@ -264,7 +264,7 @@ TEST_P(FreedMemory, ContainsNoPasswordOfARequestThatWasSent) {
 TEST_P(FreedMemory, ContainsNoPasswordOfARequestThatFailed) {
   constexpr std::int64_t SHORT = 200000; // microseconds
   const auto stall = [](Testing::ServerConnection &connection) {
-    connection.ShakeHands();
+    connection.Handshake();
     connection.WaitForInterrupt();
   };
   const auto reset = [](Testing::ServerConnection &connection) { connection.Reset(); };
@@ -281,7 +281,7 @@ enum class Reading { NOT, IN_PIECES, WHOLE, AS_XML };
 int CountFindsOfAnswers(const char *secret, const std::vector<std::string> &pieces,
                         const std::optional<Testing::TlsSettings> &tls, Reading reading) {
   const auto script = [&pieces](Testing::ServerConnection &connection) {
-    connection.ShakeHands();
+    connection.Handshake();
     connection.ReadRequest();
     for (const std::string &piece : pieces) {
       connection.Write(piece);
