@@ -1,5 +1,6 @@
-// SPDX-License-Identifier: Apache-2.0 Functions of the host that the platform calls. Fork does not wait for them,
-// because they may wait for the forking thread.
+// SPDX-License-Identifier: Apache-2.0
+// Functions of the host that the platform calls. Fork does not wait for them, because they may wait for the forking
+// thread.
 
 #include "support/data_file.h"
 #include "support/forked.h"

@@ -1,6 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
-/// @file `ServerProcess`, a scripted server in a separate process, so that no child of the test inherits its
-/// connections or its threads' use of OpenSSL.
+/// @file
+/// `ServerProcess`, a scripted server in a separate process, so that no child of the test inherits its connections or
+/// its threads' use of OpenSSL.
 
 #pragma once
 

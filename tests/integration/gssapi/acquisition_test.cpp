@@ -1,5 +1,6 @@
-// SPDX-License-Identifier: Apache-2.0 Tokens for Kerberos tickets, over TLS from the development service, which accepts
-// them with the system's GSSAPI. They are acquired with the library's handler, or leg by leg.
+// SPDX-License-Identifier: Apache-2.0
+// Tokens for Kerberos tickets, over TLS from the development service, which accepts them with the system's GSSAPI. They
+// are acquired with the library's handler, or leg by leg.
 
 #include "integration/gssapi/service_world.h"
 #include "support/process_resources.h"

@@ -1,5 +1,6 @@
-// SPDX-License-Identifier: Apache-2.0 No credentials, or credentials that the realm refuses. This is reported before
-// anything is sent to the service, and other credentials that exist are not used instead.
+// SPDX-License-Identifier: Apache-2.0
+// No credentials, or credentials that the realm refuses. This is reported before anything is sent to the service, and
+// other credentials that exist are not used instead.
 
 #include "integration/gssapi/negotiation_fixture.h"
 #include "support/throws_message.h"

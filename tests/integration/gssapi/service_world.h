@@ -1,6 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
-/// @file The starting point of tests of a whole acquisition: a realm, the development service with its key, and the
-/// user alice.
+/// @file
+/// The starting point of tests of a whole acquisition: a realm, the development service with its key, and the user
+/// alice.
 
 #pragma once
 

@@ -1,5 +1,6 @@
-// SPDX-License-Identifier: Apache-2.0 The effect of OpenSSL's configuration on the library: none, unless the host
-// requests it; then it can only add restrictions.
+// SPDX-License-Identifier: Apache-2.0
+// The effect of OpenSSL's configuration on the library: none, unless the host requests it; then it can only add
+// restrictions.
 #include "integration/openssl_host/host_process.h"
 #include "support/scripted_server.h"
 #include "support/work_folder.h"

@@ -1,6 +1,6 @@
-// SPDX-License-Identifier: Apache-2.0 A host whose first static object uses all main functions of the library, before
-// any static object of the library, or of Asio in it, is initialised. It prints with C functions, because the C++
-// streams are static objects too.
+// SPDX-License-Identifier: Apache-2.0
+// A host whose first static object uses all main functions of the library, before any static object of the library, or
+// of Asio in it, is initialised. It prints with C functions, because the C++ streams are static objects too.
 #include <ssoclient/create_saml_token.h>
 #include <ssoclient/descriptions.h>
 #include <ssoclient/security_token_service.h>
