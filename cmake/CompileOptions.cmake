@@ -1,5 +1,5 @@
 # SPDX-License-Identifier: Apache-2.0
-# How our own code is compiled. Warnings are errors in our builds; a packager who meets a newer compiler turns that off.
+# How our own code is compiled. Warnings are errors in our builds; a packager with a newer compiler turns SSOCLIENT_WERROR off.
 
 option(SSOCLIENT_WERROR "Treat warnings as errors" ${PROJECT_IS_TOP_LEVEL})
 
@@ -8,34 +8,34 @@ target_compile_options(ssoclient_options INTERFACE
   -Wall -Wextra -Wpedantic -Wshadow -Wconversion -Wsign-conversion -Wnon-virtual-dtor -Woverloaded-virtual
   -Wcast-qual -Wformat=2 -Wimplicit-fallthrough -Wundef
   $<$<BOOL:${SSOCLIENT_WERROR}>:-Werror>)
-# g++ 12 sees overlapping copies in optimised string concatenation where there are none (GCC bug 105651).
+# g++ 12 wrongly reports overlapping copies in optimised string concatenation (GCC bug 105651).
 if(CMAKE_CXX_COMPILER_ID STREQUAL "GNU" AND CMAKE_CXX_COMPILER_VERSION VERSION_LESS 13)
   target_compile_options(ssoclient_options INTERFACE -Wno-restrict)
 endif()
-# In the half gigabyte that it may fill first, g++ finds nothing worth collecting: our sources take less.
+# g++ collects garbage only above half a gigabyte. Our sources take less, so it never spends time on that.
 if(CMAKE_CXX_COMPILER_ID STREQUAL "GNU" AND PROJECT_IS_TOP_LEVEL)
   target_compile_options(ssoclient_options INTERFACE --param=ggc-min-heapsize=524288)
 endif()
-# Names that are reserved for the compiler and the standard library: clang finds them in passing, clang-tidy's check for
-# them is a sixth of its time.
+# clang finds names that are reserved for the compiler and the standard library at no cost; clang-tidy's check for them takes a
+# sixth of its time. clang also finds comments that name a parameter which does not exist.
 if(CMAKE_CXX_COMPILER_ID MATCHES "Clang")
-  target_compile_options(ssoclient_options INTERFACE -Wreserved-identifier)
+  target_compile_options(ssoclient_options INTERFACE -Wreserved-identifier -Wdocumentation)
 endif()
 if(NOT CMAKE_BUILD_TYPE STREQUAL "Debug" AND NOT SSOCLIENT_SANITIZERS)
   target_compile_definitions(ssoclient_options INTERFACE _FORTIFY_SOURCE=2)
 endif()
 target_compile_options(ssoclient_options INTERFACE -fstack-protector-strong)
-# Most of what a verification calls is in another library: through its address it is a thirtieth faster than through a stub
-# that finds the address at the first call.
+# Most functions that a verification calls are in another library. Direct calls to their addresses make it a thirtieth faster
+# than calls through stubs that find the address at the first call.
 target_compile_options(ssoclient_options INTERFACE -fno-plt)
-# Asio gives its symbols default visibility otherwise, and a host's Asio, of another version, would take their place.
+# Otherwise Asio gives its symbols default visibility, and those of a host's Asio, of another version, would replace ours.
 target_compile_definitions(ssoclient_options INTERFACE BOOST_ASIO_DISABLE_VISIBILITY)
 
 if(SSOCLIENT_SANITIZERS)
   list(JOIN SSOCLIENT_SANITIZERS "," sanitizers)
   add_compile_options(-fsanitize=${sanitizers} -fno-sanitize-recover=all -fno-omit-frame-pointer)
   add_link_options(-fsanitize=${sanitizers})
-  # What the sanitizers add to std::regex looks to g++ like use before initialisation; its manual warns of that.
+  # With the sanitizers' instrumentation g++ wrongly reports use before initialisation in std::regex; its manual warns of this.
   if(CMAKE_CXX_COMPILER_ID STREQUAL "GNU")
     target_compile_options(ssoclient_options INTERFACE -Wno-maybe-uninitialized)
   endif()
@@ -44,15 +44,15 @@ endif()
 if(SSOCLIENT_FUZZ_ENGINE AND NOT CMAKE_CXX_COMPILER_ID MATCHES "Clang")
   message(FATAL_ERROR "SSOCLIENT_FUZZ_ENGINE needs clang")
 endif()
-# The fuzzing engine steers by the coverage of the libraries' code, not only by that of the fuzz targets.
+# The fuzzing engine is guided by the coverage of the libraries' code, not only by that of the fuzz targets.
 function(ssoclient_guide_fuzzing target)
   if(SSOCLIENT_FUZZ_ENGINE)
     target_compile_options(${target} PRIVATE -fsanitize=fuzzer-no-link)
   endif()
 endfunction()
 
-# Programs that are linked often and shipped never are linked by the fastest linker there is.
-option(SSOCLIENT_FAST_LINKER "Link tests and fuzz targets by mold when it is installed" ${PROJECT_IS_TOP_LEVEL})
+# Programs that are linked often and never shipped are linked by the fastest linker.
+option(SSOCLIENT_FAST_LINKER "Link tests and fuzz targets with mold when it is installed" ${PROJECT_IS_TOP_LEVEL})
 if(SSOCLIENT_FAST_LINKER)
   find_program(SSOCLIENT_MOLD mold)
   mark_as_advanced(SSOCLIENT_MOLD)
@@ -63,8 +63,8 @@ function(ssoclient_link_fast target)
   endif()
 endfunction()
 
-# Threads of the library outlive each use of it: a program that closes a plug-in which uses it must not pull the code away
-# from under them.
+# The library's threads outlive each use of it. A program that closes a plug-in which uses the library must not unload the code
+# that those threads run.
 function(ssoclient_keep_loaded target)
   if(BUILD_SHARED_LIBS)
     target_link_options(${target} PRIVATE LINKER:-z,nodelete)

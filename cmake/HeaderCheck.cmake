@@ -1,6 +1,6 @@
 # SPDX-License-Identifier: Apache-2.0
-# Targets that compile the public headers with all our warnings: header_check_17 and header_check_20 each of them alone, as
-# C++17 and C++20; header_check_together_17 and header_check_together_20 all of them in one source. header_check is all four.
+# Targets that compile the public headers with all our warnings, as C++17 and as C++20: header_check_17 and header_check_20
+# compile each header alone, header_check_together_17 and header_check_together_20 all in one source. header_check is all four.
 
 file(GLOB_RECURSE public_headers CONFIGURE_DEPENDS
   ${PROJECT_SOURCE_DIR}/include/*.h ${PROJECT_SOURCE_DIR}/tarvel/include/*.h

@@ -1,6 +1,6 @@
 # SPDX-License-Identifier: Apache-2.0
-# What `cmake --install` puts where: both libraries, their public headers, the CMake package and the pkg-config files.
-# Components: "runtime" (what a program needs to run), "development" (what one needs to build it, and the documentation),
+# What `cmake --install` installs, and where: both libraries, their public headers, the CMake package and the pkg-config files.
+# Components: "runtime" (what a program needs to run), "development" (what it needs to be built, and the documentation),
 # "tools"; "gssapi" and "gssapi-development" for the negotiation handler.
 
 include(CMakePackageConfigHelpers)
@@ -17,16 +17,16 @@ set(ssoclient_package_dir ${CMAKE_INSTALL_LIBDIR}/cmake/ssoclient)
 install(EXPORT ssoclient-targets NAMESPACE ssoclient:: DESTINATION ${ssoclient_package_dir} COMPONENT development)
 configure_package_config_file(cmake/ssoclient-config.cmake.in ${PROJECT_BINARY_DIR}/ssoclient-config.cmake
   INSTALL_DESTINATION ${ssoclient_package_dir})
-# Before 1.0 a minor release may change the interface, so a caller that asks for 0.1 gets 0.1.
+# Before 1.0 a minor release may change the interface, so a caller that requests 0.1 gets 0.1.
 write_basic_package_version_file(${PROJECT_BINARY_DIR}/ssoclient-config-version.cmake COMPATIBILITY SameMinorVersion)
 install(FILES ${PROJECT_BINARY_DIR}/ssoclient-config.cmake ${PROJECT_BINARY_DIR}/ssoclient-config-version.cmake
   DESTINATION ${ssoclient_package_dir} COMPONENT development)
 
-# The prefix in a pkg-config file follows the file, so that an installed tree can be moved.
+# The prefix in a pkg-config file is relative to the file, so that an installed tree can be moved.
 file(RELATIVE_PATH ssoclient_pc_to_prefix
   ${CMAKE_INSTALL_FULL_LIBDIR}/pkgconfig ${CMAKE_INSTALL_PREFIX})
 string(REGEX REPLACE "/$" "" ssoclient_pc_to_prefix "${ssoclient_pc_to_prefix}")
-# Static libraries are linked with what they rest on by the program that uses them; shared ones name it themselves.
+# A program links static libraries together with the libraries that these need; shared libraries list theirs themselves.
 set(ssoclient_pc_requires "")
 if(NOT BUILD_SHARED_LIBS)
   set(ssoclient_pc_requires "Requires: openssl >= 3.0")
@@ -36,7 +36,7 @@ foreach(name tarvel ssoclient)
   install(FILES ${PROJECT_BINARY_DIR}/${name}.pc DESTINATION ${CMAKE_INSTALL_LIBDIR}/pkgconfig COMPONENT development)
 endforeach()
 
-# The handler over the GSSAPI is an option and a component of its own, so that who does without needs no Kerberos.
+# The handler over the GSSAPI is a separate option and component, so that without it no Kerberos is needed.
 if(TARGET ssoclient_gssapi)
   install(TARGETS ssoclient_gssapi EXPORT ssoclient-gssapi-targets
     RUNTIME COMPONENT gssapi
@@ -58,6 +58,6 @@ endif()
 
 install(FILES docs/man/ssoclient.1 DESTINATION ${CMAKE_INSTALL_MANDIR}/man1 COMPONENT tools)
 install(FILES LICENSE CHANGELOG.md DESTINATION ${CMAKE_INSTALL_DOCDIR} COMPONENT runtime)
-# The README together with what it points to.
+# The README and the files that it links to.
 install(FILES README.md CONTRIBUTING.md SECURITY.md DESTINATION ${CMAKE_INSTALL_DOCDIR} COMPONENT development)
 install(DIRECTORY docs examples DESTINATION ${CMAKE_INSTALL_DOCDIR} COMPONENT development)

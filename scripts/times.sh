@@ -1,12 +1,12 @@
 # SPDX-License-Identifier: Apache-2.0
 # shellcheck shell=bash
-# For scripts to source: runs steps, remembers how long each took and how it ended, and shows both as a table.
+# For scripts to source: runs steps, records the result and the time of each, and shows both as a table.
 
 step_rows=()
 failed_steps=()
 
-# run_step NAME COMMAND…: runs the command in a shell of its own, in which the first command that fails ends it. Always
-# succeeds; failed_steps has the names of those that failed.
+# run_step NAME COMMAND…: runs the command in a subshell, which ends at the first command that fails. Always succeeds itself;
+# a step that failed is added to failed_steps.
 run_step() {
   local name="$1" started=$SECONDS result=passed status
   shift
@@ -21,14 +21,14 @@ run_step() {
   step_rows+=("$(printf '%-10s %-7s %4d s' "$name" "$result" "$((SECONDS - started))")")
 }
 
-# show_steps TITLE: the table, with the sum of all steps at its end.
+# show_steps TITLE: shows the table; its last row is the time of the whole script.
 show_steps() {
   echo "=== $1"
   printf '  %s\n' "${step_rows[@]}"
   printf '  %-10s %-7s %4d s\n' total '' "$SECONDS"
 }
 
-# show_slowest COUNT FILE…: the slowest of the tests in JUnit files that ctest wrote, with the build they ran in.
+# show_slowest COUNT FILE…: shows the slowest tests in JUnit files that ctest wrote, each with the preset of its build.
 show_slowest() {
   local count="$1" file
   shift

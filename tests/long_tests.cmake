@@ -1,8 +1,8 @@
 # SPDX-License-Identifier: Apache-2.0
-# What ctest reads after it has listed the tests: those that take longest, which therefore start first. Two labels:
-#   in_full  repeats something for its own sake, and does so less often unless SSOCLIENT_TESTS_IN_FULL is set, as it is by
-#            scripts/check in_full; all of integration_signature_oracle has the label too
-#   waits    waits for a time-out of the library that has no shorter form
+# ctest reads this after it has listed the tests. The longest tests start first. Two labels:
+#   in_full  a test whose point is repetition: it repeats less often unless SSOCLIENT_TESTS_IN_FULL is set, which
+#            scripts/check in_full does; all of integration_signature_oracle has the label too
+#   waits    a test that waits for a time-out of the library that cannot be shortened
 
 # ssoclient_mark(COST LABEL TEST…)
 function(ssoclient_mark cost label)

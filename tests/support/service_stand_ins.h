@@ -10,8 +10,8 @@
 
 #include "exchange/request_builder.h"
 #include "exchange/response_handler.h"
-#include "transport/transport.h"
 #include "service/security_token_service_impl.h"
+#include "transport/transport.h"
 
 #include <tarvel/crypto/certificate.h>
 

@@ -5,7 +5,7 @@
 #include "token_report.h"
 
 #include "token/assertion_parser.h"
-#include "xml/parse_xml.h"
+#include "xml/xml_text.h"
 
 #include <nlohmann/json.hpp>
 

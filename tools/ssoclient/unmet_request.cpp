@@ -9,7 +9,7 @@
 namespace SsoClient::Tool {
 namespace {
 
-constexpr std::int64_t MICROSECONDS_PER_SECOND = 1000000;
+using Tarvel::System::MICROSECONDS_PER_SECOND;
 
 // A service may write both instants of a token in whole seconds, each of them rounded to the token's disadvantage.
 constexpr std::int64_t ROUNDING_SEC = 2;

@@ -2,9 +2,9 @@
 
 #include <tarvel/http/cookie_store.h>
 
+#include "core/fork_gate.h"
 #include "http/header_syntax.h"
 #include "http/set_cookie.h"
-#include "system/fork_gate.h"
 
 #include <tarvel/core/exception.h>
 #include <tarvel/core/string_util.h>
@@ -93,7 +93,7 @@ public:
 private:
   ~CookieStoreImpl() override = default;
 
-  mutable System::ForkSafeMutex m_mutex;
+  mutable ForkSafeMutex m_mutex;
   std::vector<Cookie> m_cookies; // in the order of their creation
 };
 
@@ -112,7 +112,7 @@ void CookieStoreImpl::SetFromHeader(std::string_view setCookie, std::string_view
                 ComputeExpiry(*parsed, now),
                 parsed->isSecure};
 
-  const std::lock_guard<System::ForkSafeMutex> lock(m_mutex);
+  const std::lock_guard<ForkSafeMutex> lock(m_mutex);
   const auto same = std::find_if(m_cookies.begin(), m_cookies.end(), [&cookie](const Cookie &other) {
     return other.name == cookie.name && other.path == cookie.path && EqualsIgnoringCase(other.host, cookie.host);
   });
@@ -131,7 +131,7 @@ void CookieStoreImpl::SetFromHeader(std::string_view setCookie, std::string_view
 
 std::string CookieStoreImpl::GetHeader(std::string_view host, std::string_view path, bool isSecure) const {
   const std::int64_t now = System::GetUtcDateTime().GetUtcTime();
-  const std::lock_guard<System::ForkSafeMutex> lock(m_mutex);
+  const std::lock_guard<ForkSafeMutex> lock(m_mutex);
   std::vector<const Cookie *> toSend;
   for (const Cookie &cookie : m_cookies) {
     if (!IsExpired(cookie, now) && (isSecure || !cookie.isSecure) && EqualsIgnoringCase(cookie.host, host) &&
@@ -150,7 +150,7 @@ std::string CookieStoreImpl::GetHeader(std::string_view host, std::string_view p
 }
 
 std::size_t CookieStoreImpl::GetCount() const {
-  const std::lock_guard<System::ForkSafeMutex> lock(m_mutex);
+  const std::lock_guard<ForkSafeMutex> lock(m_mutex);
   return m_cookies.size();
 }
 

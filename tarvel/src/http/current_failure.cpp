@@ -2,7 +2,7 @@
 
 #include "http/current_failure.h"
 
-#include "system/fork_gate.h"
+#include "core/fork_gate.h"
 
 #include <new>
 
@@ -32,7 +32,7 @@ std::shared_ptr<const Exception> CopyCurrentFailure(const std::string &endpoint)
 } // namespace
 
 const std::shared_ptr<const Exception> &OutOfMemory() {
-  const System::Computation computing;
+  const Computation computing;
   // Never destroyed, because the threads that use it run until the process ends.
   static const auto *const failure = new std::shared_ptr<const Exception>(std::make_shared<OutOfMemoryException>());
   return *failure;

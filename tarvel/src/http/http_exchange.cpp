@@ -4,7 +4,7 @@
 
 #include "http/client_response_impl.h"
 #include "http/current_failure.h"
-#include "system/uncaught_exception.h"
+#include "service/uncaught_exception.h"
 
 #include <tarvel/core/secure_wipe.h>
 #include <tarvel/core/string_util.h>
@@ -76,7 +76,7 @@ void HttpExchange::Start() {
   }
   bool isCancelled = false;
   {
-    const std::lock_guard<System::ForkSafeMutex> lock(m_mutex);
+    const std::lock_guard<ForkSafeMutex> lock(m_mutex);
     if (m_isFinishing || m_stream) {
       return; // already connected, or failed
     }
@@ -91,7 +91,7 @@ void HttpExchange::Start() {
 /// Ends the exchange without a report, if its connect has not ended.
 bool HttpExchange::Abandon() noexcept {
   UserAgent::CompletionFunction completion; // destroyed outside the lock
-  const std::lock_guard<System::ForkSafeMutex> lock(m_mutex);
+  const std::lock_guard<ForkSafeMutex> lock(m_mutex);
   if (m_isConnectOver) {
     return false;
   }
@@ -103,7 +103,7 @@ bool HttpExchange::Abandon() noexcept {
 void HttpExchange::OnConnected(const Ref<System::Stream> &stream, const Exception *failure) {
   bool isCancelled = false;
   {
-    const std::lock_guard<System::ForkSafeMutex> lock(m_mutex);
+    const std::lock_guard<ForkSafeMutex> lock(m_mutex);
     if (std::exchange(m_isConnectOver, true)) {
       return;
     }
@@ -146,7 +146,7 @@ void HttpExchange::OnWritten(const Exception *failure) {
   std::shared_ptr<const Exception> writeFailure(failure ? failure->Clone() : nullptr);
   bool endWaits = false;
   {
-    const std::lock_guard<System::ForkSafeMutex> lock(m_mutex);
+    const std::lock_guard<ForkSafeMutex> lock(m_mutex);
     m_isWriteOver = true;
     m_writeFailure = std::move(writeFailure);
     endWaits = m_endWaitsForWrite;
@@ -178,7 +178,7 @@ void HttpExchange::OnRead(std::size_t count, const Exception *failure) {
   }
   Ref<System::Stream> stream;
   {
-    const std::lock_guard<System::ForkSafeMutex> lock(m_mutex);
+    const std::lock_guard<ForkSafeMutex> lock(m_mutex);
     stream = m_stream;
   }
   if (stream) {
@@ -190,7 +190,7 @@ void HttpExchange::OnRead(std::size_t count, const Exception *failure) {
 /// that delimits the body is accepted only if the write succeeded.
 void HttpExchange::OnEnd() {
   {
-    const std::lock_guard<System::ForkSafeMutex> lock(m_mutex);
+    const std::lock_guard<ForkSafeMutex> lock(m_mutex);
     if (!m_isWriteOver && m_reader.EndsWithConnection()) {
       m_endWaitsForWrite = true;
       return;
@@ -202,7 +202,7 @@ void HttpExchange::OnEnd() {
 void HttpExchange::FinishEnd() {
   std::shared_ptr<const Exception> writeFailure;
   {
-    const std::lock_guard<System::ForkSafeMutex> lock(m_mutex);
+    const std::lock_guard<ForkSafeMutex> lock(m_mutex);
     writeFailure = m_writeFailure;
   }
   if (writeFailure) {
@@ -257,7 +257,7 @@ void HttpExchange::Finish(std::shared_ptr<const Exception> failure, const Ref<Cl
   UserAgent::CompletionFunction completion;
   bool isCancelled = false;
   {
-    const std::lock_guard<System::ForkSafeMutex> lock(m_mutex);
+    const std::lock_guard<ForkSafeMutex> lock(m_mutex);
     if (std::exchange(m_isFinishing, true)) {
       return;
     }
@@ -274,7 +274,7 @@ void HttpExchange::Finish(std::shared_ptr<const Exception> failure, const Ref<Cl
   Complete(completion, failure.get(), response);
   completion = nullptr; // releases what it captures before the waiters wake
   {
-    const std::lock_guard<System::ForkSafeMutex> lock(m_mutex);
+    const std::lock_guard<ForkSafeMutex> lock(m_mutex);
     m_failure = failure;
     m_response = response;
     m_isDone = true;
@@ -290,14 +290,14 @@ void HttpExchange::Complete(const UserAgent::CompletionFunction &completion, con
   try {
     completion(failure, response, Ref<PendingRequestItem>(this));
   } catch (...) {
-    System::LogUncaughtException("the completion function of an HTTP request");
+    Service::LogUncaughtException("the completion function of an HTTP request");
   }
 }
 
 Ref<ClientResponse> HttpExchange::Wait(std::chrono::microseconds timeout) {
   timeout = std::clamp(timeout, std::chrono::microseconds(0), MAX_TIMEOUT);
   const auto deadline = std::chrono::steady_clock::now() + timeout;
-  std::unique_lock<System::ForkSafeMutex> lock(m_mutex);
+  std::unique_lock<ForkSafeMutex> lock(m_mutex);
   if (!m_isDone && IsOfParent()) {
     throw System::NetworkException("The request to " + m_endpoint +
                                    " was under way when the process forked: its parent goes on with it");
@@ -317,7 +317,7 @@ void HttpExchange::Cancel() noexcept {
   Ref<System::ScheduledItem> connecting;
   Ref<System::Stream> stream;
   {
-    const std::lock_guard<System::ForkSafeMutex> lock(m_mutex);
+    const std::lock_guard<ForkSafeMutex> lock(m_mutex);
     if (m_isFinishing || IsOfParent()) {
       return;
     }
@@ -334,7 +334,7 @@ void HttpExchange::Cancel() noexcept {
 }
 
 bool HttpExchange::IsDone() const noexcept {
-  const std::lock_guard<System::ForkSafeMutex> lock(m_mutex);
+  const std::lock_guard<ForkSafeMutex> lock(m_mutex);
   return m_isDone || IsOfParent();
 }
 

@@ -4,9 +4,9 @@
 
 #pragma once
 
+#include "core/fork_gate.h"
 #include "http/client_request_impl.h"
 #include "http/response_reader.h"
-#include "system/fork_gate.h"
 
 #include <tarvel/core/secret_text.h>
 #include <tarvel/http/connection_spec.h>
@@ -71,9 +71,9 @@ private:
                 const Ref<ClientResponse> &response) noexcept;
 
   /// Whether this is a child's copy of its parent's exchange, which never ends here.
-  bool IsOfParent() const noexcept { return m_generation != System::GetForkGeneration(); }
+  bool IsOfParent() const noexcept { return m_generation != GetForkGeneration(); }
 
-  const unsigned m_generation = System::GetForkGeneration();
+  const unsigned m_generation = GetForkGeneration();
   const Ref<ConnectionSpec> m_spec;
   const Ref<CookieStore> m_cookies;
   const std::string m_endpoint; // for messages
@@ -85,8 +85,7 @@ private:
   ResponseReader m_reader;
   bool m_isSecure = false;
 
-  mutable System::ForkSafeMutex
-      m_mutex; // guards all members below; never held while a handler or a completion function runs
+  mutable ForkSafeMutex m_mutex; // guards all members below; never held while a handler or a completion function runs
   std::condition_variable_any m_done;
   Ref<System::ScheduledItem> m_connecting;
   Ref<System::Stream> m_stream;

@@ -20,13 +20,13 @@ void Completions::AddWrite(System::Stream::TransferHandler handler, std::size_t 
 }
 
 void Completions::Run() const noexcept {
-  const unsigned generation = System::GetForkGeneration();
+  const unsigned generation = GetForkGeneration();
   if (m_handshake) {
     CallGuarded(m_handshake, m_handshakeFailure.get());
   }
   for (const Transfer *transfer : {&m_write, &m_read}) {
     // A handler may have forked: in the child none of the others is called.
-    if (transfer->handler && generation == System::GetForkGeneration()) {
+    if (transfer->handler && generation == GetForkGeneration()) {
       CallGuarded(transfer->handler, transfer->count, transfer->failure.get());
     }
   }

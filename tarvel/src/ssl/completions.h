@@ -4,8 +4,8 @@
 
 #pragma once
 
-#include "system/fork_gate.h"
-#include "system/uncaught_exception.h"
+#include "core/fork_gate.h"
+#include "service/uncaught_exception.h"
 
 #include <tarvel/ssl/ssl_context.h>
 
@@ -16,11 +16,11 @@ namespace Tarvel::Ssl {
 
 template <typename Handler, typename... Args>
 void CallGuarded(const Handler &handler, const Args &...args) noexcept {
-  const System::HostCall call;
+  const HostCall call;
   try {
     handler(args...);
   } catch (...) {
-    System::LogUncaughtException("a completion handler");
+    Service::LogUncaughtException("a completion handler");
   }
 }
 

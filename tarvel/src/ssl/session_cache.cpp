@@ -2,7 +2,7 @@
 
 #include "ssl/session_cache.h"
 
-#include "crypto/openssl_use.h"
+#include "crypto/openssl_guard.h"
 
 #include <ctime>
 #include <iterator>
@@ -35,7 +35,7 @@ bool IsUsable(const SSL_SESSION *session) {
 } // namespace
 
 void SessionCache::Put(const std::string &key, SessionHandle session) {
-  const std::lock_guard<System::ForkSafeMutex> lock(m_mutex);
+  const std::lock_guard<ForkSafeMutex> lock(m_mutex);
   ForgetThoseOfParent();
   Entries entry;
   entry.push_back(Entry{key, std::move(session)});
@@ -53,7 +53,7 @@ void SessionCache::Put(const std::string &key, SessionHandle session) {
 }
 
 SessionHandle SessionCache::Take(const std::string &key) {
-  const std::lock_guard<System::ForkSafeMutex> lock(m_mutex);
+  const std::lock_guard<ForkSafeMutex> lock(m_mutex);
   ForgetThoseOfParent();
   for (auto end = m_byKey.upper_bound(key); end != m_byKey.lower_bound(key); end = m_byKey.upper_bound(key)) {
     const auto newest = std::prev(end);
@@ -68,27 +68,27 @@ SessionHandle SessionCache::Take(const std::string &key) {
 }
 
 void SessionCache::Abandon() noexcept {
-  const std::lock_guard<System::ForkSafeMutex> lock(m_mutex);
+  const std::lock_guard<ForkSafeMutex> lock(m_mutex);
   for (Entry &entry : m_entries) {
-    Crypto::OpenSslUse::Abandon(entry.session.release());
+    Crypto::OpenSslGuard::Abandon(entry.session.release());
   }
 }
 
 std::size_t SessionCache::GetSize() {
-  const std::lock_guard<System::ForkSafeMutex> lock(m_mutex);
+  const std::lock_guard<ForkSafeMutex> lock(m_mutex);
   ForgetThoseOfParent();
   return m_entries.size();
 }
 
 void SessionCache::ForgetThoseOfParent() {
-  if (std::exchange(m_generation, System::GetForkGeneration()) != System::GetForkGeneration()) {
+  if (std::exchange(m_generation, GetForkGeneration()) != GetForkGeneration()) {
     m_byKey.clear();
     m_entries.clear();
   }
 }
 
 void SessionCache::Clear() {
-  const std::lock_guard<System::ForkSafeMutex> lock(m_mutex);
+  const std::lock_guard<ForkSafeMutex> lock(m_mutex);
   m_byKey.clear();
   m_entries.clear();
 }

@@ -4,8 +4,8 @@
 
 #pragma once
 
+#include "core/fork_gate.h"
 #include "ssl/ssl_handles.h"
-#include "system/fork_gate.h"
 
 #include <cstddef>
 #include <list>
@@ -47,8 +47,8 @@ private:
   /// sessions.
   void ForgetThoseOfParent();
 
-  mutable System::ForkSafeMutex m_mutex;                 // guards all members below
-  unsigned m_generation = System::GetForkGeneration();   // of the process that the entries belong to
+  mutable ForkSafeMutex m_mutex;                         // guards all members below
+  unsigned m_generation = GetForkGeneration();           // of the process that the entries belong to
   Entries m_entries;                                     // oldest first
   std::multimap<std::string, Entries::iterator> m_byKey; // within a key, oldest first
 };

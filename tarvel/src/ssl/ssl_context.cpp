@@ -5,7 +5,7 @@
 #include "crypto/certificate_impl.h"
 #include "crypto/library_context.h"
 #include "crypto/openssl_errors.h"
-#include "crypto/openssl_use.h"
+#include "crypto/openssl_guard.h"
 #include "crypto/private_key_impl.h"
 #include "ssl/ssl_context_impl.h"
 #include "ssl/ssl_stream_impl.h"
@@ -49,8 +49,8 @@ SSLStream::~SSLStream() = default;
 SSLContext::~SSLContext() = default;
 
 SSLContextImpl::SSLContextImpl() {
-  Crypto::OpenSslUse::Prepare();
-  const Crypto::OpenSslUse use;
+  Crypto::OpenSslGuard::Prepare();
+  const Crypto::OpenSslGuard use;
   use.Require();
   const Crypto::OpenSslErrorScope errors;
   m_native.reset(SSL_CTX_new_ex(Crypto::GetLibraryContext(), nullptr, TLS_client_method()));
@@ -70,10 +70,10 @@ SSLContextImpl::SSLContextImpl() {
 }
 
 SSLContextImpl::~SSLContextImpl() {
-  const Crypto::OpenSslUse use;
+  const Crypto::OpenSslGuard use;
   if (!use) {
     m_sessions.Abandon();
-    Crypto::OpenSslUse::Abandon(m_native.release());
+    Crypto::OpenSslGuard::Abandon(m_native.release());
     return;
   }
   m_sessions.Clear();
@@ -82,7 +82,7 @@ SSLContextImpl::~SSLContextImpl() {
 
 // Does not use OpenSSL's default paths, because environment variables can change them.
 void SSLContextImpl::TrustSystemStore() {
-  const Crypto::OpenSslUse use;
+  const Crypto::OpenSslGuard use;
   use.Require();
   const Crypto::OpenSslErrorScope errors;
   const char *const file = X509_get_default_cert_file();
@@ -108,7 +108,7 @@ void SSLContextImpl::TrustFile(const std::string &path) {
 }
 
 void SSLContextImpl::TrustCertificates(const Crypto::CertificateList &certificates) {
-  const Crypto::OpenSslUse use;
+  const Crypto::OpenSslGuard use;
   use.Require();
   const Crypto::OpenSslErrorScope errors;
   m_sessions.Clear();
@@ -122,7 +122,7 @@ void SSLContextImpl::SetClientCertificate(const Ref<const Crypto::Certificate> &
                                           const Ref<const Crypto::PrivateKey> &key,
                                           const Crypto::CertificateList &intermediates) {
   Crypto::RequireKeyMatchesCertificate(*key, *certificate);
-  const Crypto::OpenSslUse use;
+  const Crypto::OpenSslGuard use;
   use.Require();
   const Crypto::OpenSslErrorScope errors;
   m_sessions.Clear();
@@ -138,7 +138,7 @@ void SSLContextImpl::SetClientCertificate(const Ref<const Crypto::Certificate> &
 }
 
 Ref<SSLStream> SSLContextImpl::CreateStream(const Ref<System::Stream> &stream, const std::string &endpoint) {
-  const Crypto::OpenSslUse use;
+  const Crypto::OpenSslGuard use;
   use.Require();
   return MakeRef<SSLStreamImpl>(Ref<SSLContextImpl>(this), stream, endpoint);
 }

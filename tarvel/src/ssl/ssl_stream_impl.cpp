@@ -3,7 +3,7 @@
 #include "ssl/ssl_stream_impl.h"
 
 #include "crypto/openssl_errors.h"
-#include "crypto/openssl_use.h"
+#include "crypto/openssl_guard.h"
 #include "system/io_engine.h"
 
 #include <tarvel/core/exception.h>
@@ -22,7 +22,7 @@ constexpr const char *OF_PARENT = "The connection belongs to the process that th
 /// Calls `handler` with `arguments` and an `InvalidStateException` for `reason`, on an I/O thread.
 template <typename Handler, typename... Arguments>
 void PostRefusal(Handler handler, const char *reason, Arguments... arguments) {
-  const System::Computation computing;
+  const Computation computing;
   boost::asio::post(System::GetIoContext(),
                     [handler = std::move(handler), failure = InvalidStateException(reason), arguments...] {
                       CallGuarded(handler, arguments..., static_cast<const Exception *>(&failure));
@@ -37,7 +37,7 @@ SSLStreamImpl::SSLStreamImpl(const Ref<SSLContextImpl> &context, const Ref<Syste
 
 SSLStreamImpl::~SSLStreamImpl() {
   m_endNotice.Withdraw();
-  const Crypto::OpenSslUse use;
+  const Crypto::OpenSslGuard use;
   if (!use) {
     m_tls.Abandon();
     return;
@@ -54,7 +54,7 @@ void SSLStreamImpl::AsyncHandshake(const std::string &host, const std::string &p
     PostRefusal(std::move(handler), OF_PARENT);
     return;
   }
-  const std::lock_guard<System::ForkSafeMutex> lock(m_mutex);
+  const std::lock_guard<ForkSafeMutex> lock(m_mutex);
   if (m_stage != Stage::FRESH) {
     auto failure =
         m_failure ? m_failure : std::make_shared<InvalidStateException>("The TLS handshake was started before");
@@ -77,7 +77,7 @@ void SSLStreamImpl::AsyncReadSome(char *buffer, std::size_t length, TransferHand
     PostRefusal(std::move(handler), OF_PARENT, std::size_t{0});
     return;
   }
-  const std::lock_guard<System::ForkSafeMutex> lock(m_mutex);
+  const std::lock_guard<ForkSafeMutex> lock(m_mutex);
   if (m_read || length == 0) {
     PostRefusal(std::move(handler), "Another read is pending, or the read is one of no bytes", std::size_t{0});
     return;
@@ -91,7 +91,7 @@ void SSLStreamImpl::AsyncWrite(const char *bytes, std::size_t length, TransferHa
     PostRefusal(std::move(handler), OF_PARENT, std::size_t{0});
     return;
   }
-  const std::lock_guard<System::ForkSafeMutex> lock(m_mutex);
+  const std::lock_guard<ForkSafeMutex> lock(m_mutex);
   if (m_write) {
     PostRefusal(std::move(handler), "Another write is pending", std::size_t{0});
     return;
@@ -106,8 +106,8 @@ void SSLStreamImpl::Close() noexcept {
     return;
   }
   {
-    const Crypto::OpenSslUse use;
-    const std::lock_guard<System::ForkSafeMutex> lock(m_mutex);
+    const Crypto::OpenSslGuard use;
+    const std::lock_guard<ForkSafeMutex> lock(m_mutex);
     if (!use) {
       MarkEnded();
     } else {

@@ -4,11 +4,11 @@
 
 #pragma once
 
+#include "core/fork_gate.h"
 #include "crypto/openssl_end.h"
 #include "ssl/completions.h"
 #include "ssl/ssl_context_impl.h"
 #include "ssl/tls_connection.h"
-#include "system/fork_gate.h"
 
 #include <tarvel/ssl/ssl_context.h>
 
@@ -59,7 +59,7 @@ private:
   using LowerFailure = std::optional<std::string>;
 
   /// Whether this is a child's copy of its parent's stream. Only the parent uses the connection and calls the handlers.
-  bool IsOfParent() const noexcept { return m_generation != System::GetForkGeneration(); }
+  bool IsOfParent() const noexcept { return m_generation != GetForkGeneration(); }
 
   void PostPump();
   /// Runs `step` under the lock, or fails what is pending once OpenSSL is gone; then calls the handlers. An exception
@@ -100,13 +100,13 @@ private:
   Failure MakeFailureOrNoMemory(const char *reason) const noexcept;
   void FailPending(const Failure &failure, Completions &done) noexcept;
 
-  const unsigned m_generation = System::GetForkGeneration();
+  const unsigned m_generation = GetForkGeneration();
   const Ref<System::Stream> m_lower;
   const Failure m_noMemory = std::make_shared<OutOfMemoryException>();
-  const Failure m_processEnds = std::make_shared<InvalidStateException>(Crypto::OpenSslUse::ENDED);
+  const Failure m_processEnds = std::make_shared<InvalidStateException>(Crypto::OpenSslGuard::ENDED);
   std::atomic<bool> m_wasResumed{false};
 
-  System::ForkSafeMutex m_mutex; // guards all members below; never held while a handler runs
+  ForkSafeMutex m_mutex; // guards all members below; never held while a handler runs
   Stage m_stage = Stage::FRESH;
   Failure m_failure;
   std::string m_host; // of the handshake; the endpoint before it

@@ -3,7 +3,7 @@
 #include "ssl/ssl_stream_impl.h"
 
 #include "crypto/openssl_errors.h"
-#include "crypto/openssl_use.h"
+#include "crypto/openssl_guard.h"
 #include "system/io_engine.h"
 
 #include <tarvel/core/exception.h>
@@ -50,8 +50,8 @@ template <typename Step>
 void SSLStreamImpl::Advance(const Step &step) noexcept {
   Completions done;
   {
-    const Crypto::OpenSslUse use;
-    const std::lock_guard<System::ForkSafeMutex> lock(m_mutex);
+    const Crypto::OpenSslGuard use;
+    const std::lock_guard<ForkSafeMutex> lock(m_mutex);
     if (!use) {
       MarkEnded();
       FailPending(m_failure, done);
@@ -75,7 +75,7 @@ void SSLStreamImpl::Advance(const Step &step) noexcept {
 template <typename Step>
 void SSLStreamImpl::AdvanceOnIoThread(Step step) noexcept {
   try {
-    const System::Computation computing;
+    const Computation computing;
     boost::asio::dispatch(System::GetIoContext(), [self = Ref(this), step = std::move(step)] { self->Advance(step); });
   } catch (...) {
     // On this thread, because there is no memory to go to an I/O thread.
@@ -88,7 +88,7 @@ void SSLStreamImpl::AdvanceOnIoThread(Step step) noexcept {
 void SSLStreamImpl::OnOpenSslEnd(void *stream) noexcept {
   auto &self = *static_cast<SSLStreamImpl *>(stream);
   {
-    const std::lock_guard<System::ForkSafeMutex> lock(self.m_mutex);
+    const std::lock_guard<ForkSafeMutex> lock(self.m_mutex);
     self.MarkEnded();
   }
   self.m_lower->Close();

@@ -2,7 +2,7 @@
 
 #include "ssl/tls_connection.h"
 
-#include "crypto/openssl_use.h"
+#include "crypto/openssl_guard.h"
 
 #include <tarvel/core/exception.h>
 #include <tarvel/core/string_util.h>
@@ -259,9 +259,9 @@ void TlsConnection::End(bool remembersSessions) noexcept {
 }
 
 void TlsConnection::Abandon() noexcept {
-  Crypto::OpenSslUse::Abandon(m_connection.release());
+  Crypto::OpenSslGuard::Abandon(m_connection.release());
   for (SessionHandle &session : m_newSessions) {
-    Crypto::OpenSslUse::Abandon(session.release());
+    Crypto::OpenSslGuard::Abandon(session.release());
   }
 }
 

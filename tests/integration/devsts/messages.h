@@ -11,7 +11,7 @@
 #include "tls_client.h"
 
 #include <ssoclient/token_spec.h>
-#include <tarvel/system/environment.h>
+#include <tarvel/core/environment.h>
 
 #include <gtest/gtest.h>
 
@@ -55,7 +55,7 @@ public:
   explicit ShiftedClock(std::chrono::seconds ahead);
 
 private:
-  Tarvel::System::ScopedEnvironment m_scope;
+  Tarvel::ScopedEnvironment m_scope;
 };
 
 /// The answer is a SOAP fault, by HTTP status 500, of exactly this code and text.

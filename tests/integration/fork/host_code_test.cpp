@@ -2,11 +2,11 @@
 // Functions of the host that the platform calls. Fork does not wait for them, because they may wait for the forking
 // thread.
 
+#include "core/fork_gate.h"
 #include "support/data_file.h"
 #include "support/forked.h"
 #include "support/posting_server.h"
 #include "support/rendezvous.h"
-#include "system/fork_gate.h"
 
 #include <ssoclient/connection_spec.h>
 #include <tarvel/core/exception.h>
@@ -42,7 +42,7 @@ TEST(ForkDuringTheHostsCode, DoesNotWaitForALogSink) {
   const Ref<Service::LogRoot> root = Service::GetApp().GetRootLogger();
   root->SetSink([&gate](const Service::LogRecord &) { gate.Pass(); });
   std::thread logging([&root] {
-    const System::Computation computing; // the platform itself logs within computations
+    const Computation computing; // the platform itself logs within computations
     root->Write(Service::LogRecord{});
   });
   ExpectForkWhileHeldAt(gate);

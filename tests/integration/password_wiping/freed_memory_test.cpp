@@ -5,13 +5,13 @@
 #include "exchange/request_builder_impl.h"
 #include "exchange/soap_response.h"
 #include "integration/transport/service_stand_in.h"
-#include "service/wiped_text.h"
 #include "support/identity.h"
 #include "support/rendezvous.h"
 #include "support/service_stand_ins.h"
-#include "xml/parse_xml.h"
+#include "xml/xml_text.h"
 
 #include <tarvel/core/exception.h>
+#include <tarvel/core/secret_text.h>
 #include <tarvel/core/secure_wipe.h>
 #include <tarvel/xml/parser.h>
 
@@ -207,8 +207,8 @@ TEST_P(FreedMemory, HoldsTheWipedRequestBeforeTheResponseIsRead) {
 TEST_P(FreedMemory, HoldsNoTextThatWasKeptAsASecret) {
   const std::string password = GetParam();
   const Watch watch(GetParam());
-  auto text = std::make_unique<WipedText>(password);
-  auto copy = std::make_unique<WipedText>(*text);
+  auto text = std::make_unique<Tarvel::SecretText>(password);
+  auto copy = std::make_unique<Tarvel::SecretText>(*text);
   text.reset();
   EXPECT_EQ(copy->Get(), password);
   copy.reset();

@@ -165,7 +165,7 @@ const Refusal REFUSALS[] = {
     {"MissingKeyStore", "acquire " STS "--p12 missing.p12", 7, "IOException", "file",
      "Cannot open missing.p12: No such file or directory"},
     {"KeyOfAnotherCertificate", "acquire " STS "--cert other.crt --key holder.key", 7, "KeyMismatchException", "key",
-     "The private key is not the one of the certificate CN=not trusted,O=Example"},
+     "The private key does not belong to the certificate CN=not trusted,O=Example"},
     {"KeyFileWithoutKey", "acquire " STS "--cert holder.crt --key holder.crt", 7, "NoKeyException", "key",
      "holder.crt: There is no private key in the text"},
     {"KeyStoreWithoutKey",

@@ -5,7 +5,7 @@
 #include "exchange/soap_response.h"
 #include "integration/transport/service_stand_in.h"
 #include "support/throws_message.h"
-#include "xml/node_text.h"
+#include "xml/xml_text.h"
 
 #include <tarvel/core/exception.h>
 #include <tarvel/http/url.h>

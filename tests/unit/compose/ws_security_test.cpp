@@ -31,7 +31,7 @@ TEST(WssuTimestampBuilder, ExpiresExactlyTenMinutesAfterItWasCreatedWithMillisec
 
 TEST(WssuTimestampBuilder, ReadsTheClockWhenItIsMadeAndNotWhenItIsBuilt) {
   std::int64_t now = FIXED_NOW;
-  const Tarvel::System::ScopedEnvironment environment({[&now] { return now; }, {}});
+  const Tarvel::ScopedEnvironment environment({[&now] { return now; }, {}});
   const XMLBuilderPtr timestamp = WssuTimestampBuilder(10);
   now += 3600000000;
   EXPECT_EQ(SerializeToXML(timestamp), TIMESTAMP);
@@ -39,7 +39,7 @@ TEST(WssuTimestampBuilder, ReadsTheClockWhenItIsMadeAndNotWhenItIsBuilt) {
 
 TEST(WssuTimestampBuilder, ReadsTheClockOnce) {
   std::int64_t now = FIXED_NOW;
-  const Tarvel::System::ScopedEnvironment environment({[&now] { return now += 1000000; }, {}});
+  const Tarvel::ScopedEnvironment environment({[&now] { return now += 1000000; }, {}});
   WssuTimestampBuilder(10);
   EXPECT_EQ(now, FIXED_NOW + 1000000);
 }

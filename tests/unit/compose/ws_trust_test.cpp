@@ -159,7 +159,7 @@ TEST(WssuLifetimeBuilder, ExpiresSixHundredSecondsAfterItWasCreated) {
 
 TEST(WssuLifetimeBuilder, ReadsTheClockOnce) {
   std::int64_t now = FIXED_NOW;
-  const Tarvel::System::ScopedEnvironment environment({[&now] { return now += 1000000; }, {}});
+  const Tarvel::ScopedEnvironment environment({[&now] { return now += 1000000; }, {}});
   WssuLifetimeBuilder(600);
   EXPECT_EQ(now, FIXED_NOW + 1000000);
 }

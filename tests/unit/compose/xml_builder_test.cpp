@@ -3,7 +3,7 @@
 #include "compose/xml_builder.h"
 
 #include "support/throws_message.h"
-#include "xml/parse_xml.h"
+#include "xml/xml_text.h"
 
 #include <tarvel/core/exception.h>
 

@@ -2,6 +2,7 @@
 
 #include "support/identity.h"
 #include "support/posting_server.h"
+#include "support/reporting_ssl_context.h"
 #include "support/soap_responses.h"
 #include "support/throws_message.h"
 
@@ -44,6 +45,32 @@ TEST(CreateGssNegotiationContext, MakesAContextThatNegotiatesOverTlsAfterTheConf
   const GssNegotiationResult last = context->NegotiateToken({8});
   EXPECT_EQ(*last.serverLeg, (Bytes{4, 5, 6}));
   EXPECT_NE(last.token, nullptr);
+}
+
+TEST(CreateGssNegotiationContext, KeepsTheSslContextThatItsCallerReleases) {
+  const Testing::PostingServer server({Testing::IntermediateLeg("ctx", "AQID")}, Testing::TlsSettings());
+  std::shared_ptr<GssNegotiationContext> context;
+  {
+    const auto tls = Testing::ContextThatTrustsTheTestAuthority();
+    SecurityTokenServiceConfig config = ConfigFor(server.GetUrl());
+    config.sslContext = tls.get();
+    context = CreateGssNegotiationContext(config, Spec());
+  }
+  EXPECT_EQ(*context->NegotiateToken({7}).serverLeg, (Bytes{1, 2, 3}));
+}
+
+TEST(CreateGssNegotiationContext, ReleasesTheSslContextWhenTheNegotiationIsDestroyed) {
+  const auto isDestroyed = std::make_shared<bool>(false);
+  std::shared_ptr<GssNegotiationContext> context;
+  {
+    const auto tls = Tarvel::MakeRef<Testing::ReportingSslContext>(isDestroyed);
+    SecurityTokenServiceConfig config = ConfigFor("https://localhost/");
+    config.sslContext = tls.get();
+    context = CreateGssNegotiationContext(config, Spec());
+  }
+  EXPECT_FALSE(*isDestroyed);
+  context.reset();
+  EXPECT_TRUE(*isDestroyed);
 }
 
 TEST(CreateGssNegotiationContext, GivesTheHolderOfKeyIdentityToTheRequests) {

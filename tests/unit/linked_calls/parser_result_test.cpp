@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 // What becomes of a parse that yields nothing, or something else than a document. The platform's own parser never does.
-#include "xml/parse_xml.h"
+#include "xml/xml_text.h"
 
 #include "support/throws_message.h"
 

@@ -10,7 +10,10 @@
 
 #include <gtest/gtest.h>
 
+#include <set>
+#include <string>
 #include <type_traits>
+#include <utility>
 #include <vector>
 
 namespace {
@@ -29,6 +32,10 @@ protected:
   ~WithOneMore() = default;
 };
 
+/// The virtual one of the overloads of a name.
+template <typename Value>
+using Sets = void (SamlToken::*)(Value &) const;
+
 TEST(DeclaredOrder, SlotsOfSamlToken) {
   const std::vector<std::size_t> slots{SlotOf(&SamlToken::GetId),
                                        SlotOf(&SamlToken::GetStartDate),
@@ -38,11 +45,11 @@ TEST(DeclaredOrder, SlotsOfSamlToken) {
                                        SlotOf(&SamlToken::IsDelegable),
                                        SlotOf(&SamlToken::IsSolution),
                                        SlotOf(&SamlToken::GetConfirmationMethod),
-                                       SlotOf(&SamlToken::GetFullName),
-                                       SlotOf(&SamlToken::GetGroups),
-                                       SlotOf(&SamlToken::GetDelegationChain),
-                                       SlotOf(&SamlToken::GetAudience),
-                                       SlotOf(&SamlToken::GetAdvice),
+                                       SlotOf<Sets<std::pair<std::string, std::string>>>(&SamlToken::GetFullName),
+                                       SlotOf<Sets<std::vector<PrincipalId>>>(&SamlToken::GetGroups),
+                                       SlotOf<Sets<std::vector<Delegate>>>(&SamlToken::GetDelegationChain),
+                                       SlotOf<Sets<std::set<std::string>>>(&SamlToken::GetAudience),
+                                       SlotOf<Sets<std::vector<Advice>>>(&SamlToken::GetAdvice),
                                        SlotOf(&SamlToken::GetConfirmationCertificate),
                                        SlotOf(&SamlToken::ToXml),
                                        SlotOf(&WithOneMore<SamlToken>::OneMore)};

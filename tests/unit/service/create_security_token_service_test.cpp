@@ -2,6 +2,7 @@
 
 #include "support/identity.h"
 #include "support/posting_server.h"
+#include "support/reporting_ssl_context.h"
 #include "support/soap_responses.h"
 #include "support/throws_message.h"
 
@@ -45,6 +46,32 @@ TEST(CreateSecurityTokenService, MakesAServiceThatAcquiresTokensOverTlsAfterTheC
   EXPECT_EQ(token->GetSubject().ToString(), "{Name: alice; Domain:corp.example}");
   ASSERT_EQ(server.GetRequests().size(), 1u);
   EXPECT_EQ(server.GetRequests()[0].rfind("POST /sts HTTP/1.1\r\n", 0), 0u);
+}
+
+TEST(CreateSecurityTokenService, KeepsTheContextThatItsCallerReleases) {
+  const PostingServer server({Issued()}, Testing::TlsSettings());
+  std::shared_ptr<const SecurityTokenService> service;
+  {
+    const auto context = Testing::ContextThatTrustsTheTestAuthority();
+    SecurityTokenServiceConfig config = ConfigFor(server.GetUrl());
+    config.sslContext = context.get();
+    service = CreateSecurityTokenService(config);
+  }
+  EXPECT_NE(service->AcquireToken("alice@corp.example", "pass", Spec()), nullptr);
+}
+
+TEST(CreateSecurityTokenService, ReleasesTheContextWhenTheServiceIsDestroyed) {
+  const auto isDestroyed = std::make_shared<bool>(false);
+  std::shared_ptr<const SecurityTokenService> service;
+  {
+    const auto context = Tarvel::MakeRef<Testing::ReportingSslContext>(isDestroyed);
+    SecurityTokenServiceConfig config = ConfigFor("https://localhost/");
+    config.sslContext = context.get();
+    service = CreateSecurityTokenService(config);
+  }
+  EXPECT_FALSE(*isDestroyed);
+  service.reset();
+  EXPECT_TRUE(*isDestroyed);
 }
 
 TEST(CreateSecurityTokenService, GivesTheSslParameterToTheHandshake) {

@@ -29,39 +29,39 @@ using Contexts = KeptContexts<Handle, 2>;
 
 TEST(KeptContexts, HaveNothingAtFirst) {
   Contexts contexts;
-  EXPECT_EQ(contexts.Take(0), nullptr);
-  EXPECT_EQ(contexts.Take(1), nullptr);
+  EXPECT_EQ(contexts.Acquire(0), nullptr);
+  EXPECT_EQ(contexts.Acquire(1), nullptr);
 }
 
 TEST(KeptContexts, GiveEachContextOnce) {
   Contexts contexts;
   Context context;
-  contexts.Put(1, Handle(&context));
-  EXPECT_EQ(contexts.Take(1).release(), &context);
-  EXPECT_EQ(contexts.Take(1), nullptr);
+  contexts.Return(1, Handle(&context));
+  EXPECT_EQ(contexts.Acquire(1).release(), &context);
+  EXPECT_EQ(contexts.Acquire(1), nullptr);
   EXPECT_FALSE(context.freed);
 }
 
 TEST(KeptContexts, DoNotTakeOneKindForAnother) {
   Contexts contexts;
   Context context;
-  contexts.Put(1, Handle(&context));
-  EXPECT_EQ(contexts.Take(0), nullptr);
-  EXPECT_EQ(contexts.Take(1).release(), &context);
+  contexts.Return(1, Handle(&context));
+  EXPECT_EQ(contexts.Acquire(0), nullptr);
+  EXPECT_EQ(contexts.Acquire(1).release(), &context);
 }
 
 TEST(KeptContexts, GiveTheContextOfAnotherThreadWhenThereIsNoneOfTheirOwn) {
   Contexts contexts;
   Context context;
-  std::thread([&] { contexts.Put(0, Handle(&context)); }).join();
-  EXPECT_EQ(contexts.Take(0).release(), &context);
+  std::thread([&] { contexts.Return(0, Handle(&context)); }).join();
+  EXPECT_EQ(contexts.Acquire(0).release(), &context);
 }
 
 TEST(KeptContexts, FreeWhatThereIsNoRoomFor) {
   Contexts contexts;
   std::vector<Context> many(5); // of one kind there is room for four
   for (Context &context : many) {
-    contexts.Put(0, Handle(&context));
+    contexts.Return(0, Handle(&context));
   }
   EXPECT_FALSE(many[3].freed);
   EXPECT_TRUE(many[4].freed);
@@ -71,13 +71,13 @@ TEST(KeptContexts, FreeAllFreesWhatIsKept) {
   Contexts contexts;
   std::vector<Context> many(4);
   for (std::size_t index = 0; index < many.size(); ++index) {
-    contexts.Put(index % 2, Handle(&many[index]));
+    contexts.Return(index % 2, Handle(&many[index]));
   }
   contexts.FreeAll();
   for (const Context &context : many) {
     EXPECT_TRUE(context.freed);
   }
-  EXPECT_EQ(contexts.Take(0), nullptr);
+  EXPECT_EQ(contexts.Acquire(0), nullptr);
 }
 
 TEST(KeptContexts, GiveAContextToOneThreadAtATime) {
@@ -85,20 +85,20 @@ TEST(KeptContexts, GiveAContextToOneThreadAtATime) {
   Contexts contexts;
   std::vector<Context> made(4); // as many as there is room for: none is ever freed
   for (Context &context : made) {
-    contexts.Put(0, Handle(&context));
+    contexts.Return(0, Handle(&context));
   }
   std::atomic<int> shared{0};
   std::vector<std::thread> threads;
   for (int thread = 0; thread < 8; ++thread) {
     threads.emplace_back([&] {
       for (int round = 0; round < ROUNDS; ++round) {
-        Handle context = contexts.Take(0);
+        Handle context = contexts.Acquire(0);
         if (!context) {
           continue; // others have them all
         }
         shared += context->users.fetch_add(1) == 0 ? 0 : 1;
         context->users.fetch_sub(1);
-        contexts.Put(0, std::move(context));
+        contexts.Return(0, std::move(context));
       }
     });
   }

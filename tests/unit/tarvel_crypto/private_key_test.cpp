@@ -271,7 +271,7 @@ TEST(LoadKeyStore, NamesThePathInEachRefusal) {
 
 TEST(RequireKeyMatchesCertificate, RefusesAnotherKeyOfTheSameAndOfAnotherKind) {
   const auto certificate = FixtureCertificate("rsa2048");
-  const std::string message = "The private key is not the one of the certificate CN=rsa2048,O=Example";
+  const std::string message = "The private key does not belong to the certificate CN=rsa2048,O=Example";
   EXPECT_THROWS_MESSAGE(RequireKeyMatchesCertificate(*FixtureKey("rsa3072"), *certificate), KeyMismatchException,
                         message);
   EXPECT_THROWS_MESSAGE(RequireKeyMatchesCertificate(*FixtureKey("p256"), *certificate), KeyMismatchException, message);

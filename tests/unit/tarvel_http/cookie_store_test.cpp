@@ -3,9 +3,9 @@
 #include "http/cookie_date.h"
 #include "support/throws_message.h"
 
+#include <tarvel/core/environment.h>
 #include <tarvel/core/exception.h>
 #include <tarvel/http/cookie_store.h>
-#include <tarvel/system/environment.h>
 
 #include <gtest/gtest.h>
 
@@ -33,7 +33,7 @@ protected:
   }
 
   std::atomic<std::int64_t> m_now{START};
-  const System::ScopedEnvironment m_clock{{[this] { return m_now.load(); }, nullptr}};
+  const ScopedEnvironment m_clock{{[this] { return m_now.load(); }, nullptr}};
   const Ref<CookieStore> m_store = CreateCookieStore();
 };
 

@@ -77,7 +77,7 @@ TEST(CreateSignatureFromDom, AcceptsIdsAndKeyInfoAndObjects) {
 TEST(CreateSignatureFromDom, SaysWhereTheSyntaxIsWrong) {
   EXPECT_THROWS_MESSAGE(ReadSyntax(Replaced(MINIMAL, "<ds:SignedInfo>", "\n  <ds:Foo/><ds:SignedInfo>")),
                         SignatureSyntaxException,
-                        "Expected ds:SignedInfo in \"ds:Signature\", but \"ds:Foo\" stands there at line 2, column 3");
+                        "Expected ds:SignedInfo in \"ds:Signature\", but found \"ds:Foo\" at line 2, column 3");
 }
 
 TEST(CreateSignatureFromDom, RefusesAnElementThatIsNoSignature) {
@@ -97,19 +97,19 @@ TEST(CreateSignatureFromDom, RefusesWhatIsNotOfTheForm) {
       {"<ds:Signature xmlns:ds='http://www.w3.org/2000/09/xmldsig#'>", "<ds:Signature xmlns:ds='urn:other'>",
        "Expected ds:Signature, found \"ds:Signature\""},
       {"<ds:SignedInfo>", "<ds:SignedInfo xmlns:ds='urn:other'>",
-       "Expected ds:SignedInfo in \"ds:Signature\", but \"ds:SignedInfo\" stands there"},
+       "Expected ds:SignedInfo in \"ds:Signature\", but found \"ds:SignedInfo\""},
       {"<ds:SignatureValue>AAAA</ds:SignatureValue>", "",
        "Expected ds:SignatureValue in \"ds:Signature\", but nothing follows"},
       {"</ds:Signature>", "<ds:Foo/></ds:Signature>", "Unexpected element \"ds:Foo\" in \"ds:Signature\""},
       {"</ds:Signature>", "<ds:KeyInfo/><ds:KeyInfo/></ds:Signature>",
        "Unexpected element \"ds:KeyInfo\" in \"ds:Signature\""},
       {"<ds:SignatureValue>", "<ds:KeyInfo/><ds:SignatureValue>",
-       "Expected ds:SignatureValue in \"ds:Signature\", but \"ds:KeyInfo\" stands there"},
+       "Expected ds:SignatureValue in \"ds:Signature\", but found \"ds:KeyInfo\""},
       {"</ds:SignedInfo>", "text</ds:SignedInfo>", "Unexpected content in \"ds:SignedInfo\""},
       {"</ds:SignedInfo>", "<?pi?></ds:SignedInfo>", "Unexpected content in \"ds:SignedInfo\""},
       {"</ds:SignedInfo>", "<ds:KeyInfo/></ds:SignedInfo>", "Unexpected element \"ds:KeyInfo\" in \"ds:SignedInfo\""},
       {"<ds:SignatureMethod Algorithm='urn:s'/>", "",
-       "Expected ds:SignatureMethod in \"ds:SignedInfo\", but \"ds:Reference\" stands there"},
+       "Expected ds:SignatureMethod in \"ds:SignedInfo\", but found \"ds:Reference\""},
       {"<ds:SignatureMethod Algorithm='urn:s'/>", "<ds:SignatureMethod/>",
        "The element \"ds:SignatureMethod\" has no attribute \"Algorithm\""},
       {"<ds:SignatureMethod Algorithm='urn:s'/>", "<ds:SignatureMethod Algorithm='urn:s' Other=''/>",
@@ -124,7 +124,7 @@ TEST(CreateSignatureFromDom, RefusesWhatIsNotOfTheForm) {
       {"<ds:Reference URI='#a'>", "<ds:Reference URI='#a' xml:lang='en'>",
        "Unexpected attribute \"xml:lang\" of \"ds:Reference\""},
       {"<ds:DigestMethod Algorithm='urn:d'/>", "",
-       "Expected ds:DigestMethod in \"ds:Reference\", but \"ds:DigestValue\" stands there"},
+       "Expected ds:DigestMethod in \"ds:Reference\", but found \"ds:DigestValue\""},
       {"<ds:DigestValue>AAAA<", "<ds:DigestValue>AAA<", "The text of \"ds:DigestValue\" is not Base64"},
       {"<ds:DigestValue>AAAA<", "<ds:DigestValue> <",
        "The element \"ds:DigestValue\" must have text, and nothing else"},

@@ -8,7 +8,7 @@
 #include "unit/token/assertion_text.h"
 
 #include <ssoclient/exceptions.h>
-#include <tarvel/system/environment.h>
+#include <tarvel/core/environment.h>
 #include <tarvel/xml/parser.h>
 #include <tarvel/xml/security/exceptions.h>
 
@@ -42,7 +42,7 @@ CertificateList Trusted(const std::string &name = "sts-rsa") {
 /// It is 2026-01-02T03:04:05Z in all of these tests.
 class CreateSamlTokenTest : public ::testing::Test {
 private:
-  Tarvel::System::ScopedEnvironment m_clock{{[] { return DateTime("2026-01-02T03:04:05Z").GetUtcTime(); }, {}}};
+  Tarvel::ScopedEnvironment m_clock{{[] { return DateTime("2026-01-02T03:04:05Z").GetUtcTime(); }, {}}};
 };
 
 TEST_F(CreateSamlTokenTest, AnswersWhatAFullTokenSays) {
@@ -294,13 +294,13 @@ TEST(CreateSamlTokenClock, ToleratesTenMinutesWhenNothingElseIsSaid) {
   const ParsedDocument document(Fixture("expired"));
   const CertificateList trusted = Trusted();
   {
-    const Tarvel::System::ScopedEnvironment clock({[end] { return end + 600'000'000 - 1; }, {}});
+    const Tarvel::ScopedEnvironment clock({[end] { return end + 600'000'000 - 1; }, {}});
     EXPECT_NO_THROW(CreateSamlToken(Fixture("expired"), trusted));
     EXPECT_NO_THROW(CreateSamlToken(Fixture("expired"), trusted.front().get()));
     EXPECT_NO_THROW(CreateSamlTokenFromDom(document.Root(), trusted));
   }
   const std::string message = "The token has expired at: 2021-01-01T00:00:00.000Z";
-  const Tarvel::System::ScopedEnvironment clock({[end] { return end + 600'000'000; }, {}});
+  const Tarvel::ScopedEnvironment clock({[end] { return end + 600'000'000; }, {}});
   EXPECT_THROWS_MESSAGE(CreateSamlToken(Fixture("expired"), trusted), ParseException, message);
   EXPECT_THROWS_MESSAGE(CreateSamlToken(Fixture("expired"), trusted.front().get()), ParseException, message);
   EXPECT_THROWS_MESSAGE(CreateSamlTokenFromDom(document.Root(), trusted), ParseException, message);

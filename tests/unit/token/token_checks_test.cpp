@@ -5,7 +5,7 @@
 #include "support/throws_message.h"
 
 #include <ssoclient/exceptions.h>
-#include <tarvel/system/environment.h>
+#include <tarvel/core/environment.h>
 
 #include <gtest/gtest.h>
 
@@ -60,7 +60,7 @@ protected:
 
 private:
   static inline const std::int64_t m_now = DateTime("2026-01-02T03:04:05.006Z").GetUtcTime();
-  Tarvel::System::ScopedEnvironment m_clock{{[] { return m_now; }, {}}};
+  Tarvel::ScopedEnvironment m_clock{{[] { return m_now; }, {}}};
 };
 
 TEST_F(CheckTokenPropertiesTest, AcceptsACurrentToken) {
@@ -155,6 +155,30 @@ TEST_F(CheckTokenPropertiesTest, RefusesEveryWindowWithAToleranceBeforeAllTime) 
   }
 }
 
+// The dates themselves cannot leave the years 1 to 9999; the tolerance still counts there.
+TEST_F(CheckTokenPropertiesTest, AppliesTheToleranceBeyondTheFirstAndTheLastDate) {
+  const DateTime first("0001-01-01T00:00:00Z");
+  const DateTime last("9999-12-31T23:59:59.999999Z");
+  SamlAssertionType assertion = HolderOfKey();
+  assertion.Conditions.NotBefore = first;
+  assertion.Conditions.NotOnOrAfter = last;
+  {
+    const Tarvel::ScopedEnvironment clock({[&last] { return last.GetUtcTime(); }, {}});
+    EXPECT_NO_THROW(CheckTokenProperties(assertion, 1));
+    EXPECT_THROWS_MESSAGE(CheckTokenProperties(assertion, 0), ParseException,
+                          "The token has expired at: 9999-12-31T23:59:59.999Z");
+    assertion.Conditions.NotBefore = last.PlusSeconds(-1);
+    EXPECT_THROWS_MESSAGE(CheckTokenProperties(assertion, -2), ParseException,
+                          "Token start date is in the future: 9999-12-31T23:59:58.999Z");
+  }
+  const Tarvel::ScopedEnvironment clock({[&first] { return first.GetUtcTime(); }, {}});
+  assertion.Conditions.NotBefore = first;
+  assertion.Conditions.NotOnOrAfter = first.PlusSeconds(1);
+  EXPECT_NO_THROW(CheckTokenProperties(assertion, 0));
+  EXPECT_THROWS_MESSAGE(CheckTokenProperties(assertion, -1), ParseException,
+                        "Token start date is in the future: 0001-01-01T00:00:00.000Z");
+}
+
 TEST_F(CheckTokenPropertiesTest, RefusesABearerSubjectThatEndsBeforeTheToken) {
   SamlAssertionType assertion = Good();
   assertion.Subject.SubjectConfirmation.SubjectConfirmationData.NotOnOrAfter = AtSecond(3599);
@@ -245,14 +269,14 @@ TEST_F(CheckTokenPropertiesTest, ReadsTheClockOnce) {
     ++looks;
     return now;
   };
-  const Tarvel::System::ScopedEnvironment clock({look, {}});
+  const Tarvel::ScopedEnvironment clock({look, {}});
   Check(Good());
   EXPECT_EQ(looks, 1);
 }
 
 TEST_F(CheckTokenPropertiesTest, ReadsTheClockOnlyAfterVersionIdAndOrderOfTheDates) {
   int looks = 0;
-  const Tarvel::System::ScopedEnvironment clock({[&looks] { return ++looks; }, {}});
+  const Tarvel::ScopedEnvironment clock({[&looks] { return ++looks; }, {}});
   SamlAssertionType assertion = ValidBetween(0, 0);
   EXPECT_THROWS_MESSAGE(Check(assertion), ParseException,
                         "Unsatisfiable token validity conditions: NotBefore must be less than NotOnOrAfter.");

@@ -3,7 +3,7 @@
 #include "xml/node_filter_iterator.h"
 
 #include "support/parsed_document.h"
-#include "xml/node_text.h"
+#include "xml/xml_text.h"
 
 #include <gtest/gtest.h>
 

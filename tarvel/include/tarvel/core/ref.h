@@ -38,7 +38,7 @@ private:
 };
 
 /// A counted reference to a `T` that has `AddRef` and `Release` (an `Object`, or a node of an XML tree). May be null.
-/// Copying shares, destroying releases. One `Ref` is for one thread at a time; copies may live on any thread.
+/// Copying shares the object, destroying releases it. One `Ref` is for one thread at a time; copies may be used on any thread.
 template <typename T>
 class Ref {
 public:
@@ -81,7 +81,7 @@ public:
 
   void reset() noexcept { *this = Ref(); }
 
-  /// Gives the reference up without releasing it: the caller owns one count from here on.
+  /// Gives up the reference without releasing it: the caller owns one count from then on.
   [[nodiscard]] T *Detach() noexcept { return std::exchange(m_object, nullptr); }
 
   template <typename U>
@@ -103,7 +103,7 @@ Ref<T> MakeRef(Args &&...args) {
   return Ref<T>(new T(std::forward<Args>(args)...));
 }
 
-/// Raises `TypeMismatchException` naming the expected and the actual class.
+/// Throws `TypeMismatchException`; the message contains the expected and the actual class.
 [[noreturn]] TARVEL_API void ThrowTypeMismatch(const char *expected, const char *actual);
 
 } // namespace Tarvel

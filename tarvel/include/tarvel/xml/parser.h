@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// The XML parser and the handler that makes a tree of what it reads.
+/// The XML parser, and the handler that builds a tree.
 
 #pragma once
 
@@ -17,8 +17,8 @@
 
 namespace Tarvel::Xml {
 
-/// A document that is not well-formed (XML 1.0, Namespaces in XML 1.0), or that has what this platform refuses: a document
-/// type declaration, an XML version other than 1.0, an encoding other than UTF-8, or more than one of the limits below.
+/// A document that is not well-formed (XML 1.0, Namespaces in XML 1.0), or that has something this library refuses: a
+/// document type declaration, an XML version other than 1.0, an encoding other than UTF-8, or more than the limits below.
 /// The message ends in " at line L, column C".
 class TARVEL_API XMLParseException : public Exception {
 public:
@@ -44,15 +44,15 @@ constexpr unsigned MAX_NAMESPACES_IN_SCOPE = 256;             ///< declarations 
 constexpr std::size_t MAX_NODES = 1024 * 1024;                ///< of one document: nodes and attributes
 constexpr std::size_t MAX_NAME_BYTES = 4096;                  ///< of an element, attribute or target, prefix included
 
-/// Receives a document as it is parsed. The platform's one handler is the document handler.
+/// Receives a document as it is parsed. The library has one handler, the document handler.
 class XMLHandler;
 
 /// A parser bound to one handler. For one thread at a time.
 class TARVEL_API XMLParser : public Object {
 public:
   /// Reads `reader` to its end and returns what the handler made of the document.
-  /// @throws XMLParseException as that class says; the handler then yields nothing.
-  /// @throws IOException when the reader fails. @throws std::bad_alloc when memory runs out, which says nothing about the
+  /// @throws XMLParseException when the document is refused; the handler then has no result.
+  /// @throws IOException when the reader fails. @throws std::bad_alloc when memory runs out, which is no verdict on the
   ///         document.
   virtual Ref<Object> Parse(Reader &reader) = 0;
 
@@ -63,7 +63,7 @@ protected:
 /// A handler that builds a `Document`.
 TARVEL_API Ref<XMLHandler> CreateXMLDocumentHandler();
 
-/// A parser on `handler`.
+/// A parser that reports to `handler`.
 TARVEL_API Ref<XMLParser> CreateXMLParser(const Ref<XMLHandler> &handler);
 
 /// One attribute of a start tag; the views are valid during the call.
@@ -77,11 +77,11 @@ struct AttributeEvent {
   bool IsNamespaceDeclaration() const noexcept { return (prefixLength ? GetPrefix() : name) == "xmlns"; }
 };
 
-/// What receives the events of a document. An exception that leaves a function ends the parse and reaches its caller.
+/// Receives the events of a document. An exception that a function throws ends the parse and reaches the caller of `Parse`.
 class TARVEL_API XMLHandler : public Object {
 public:
-  /// A document begins. `source` is its text; it stays where it is, and alive, as long as somebody holds `owner`, so that
-  /// views into it need not be copied.
+  /// A document begins. `source` is its text. It is valid and does not move as long as `owner` exists, so that views of it
+  /// need not be copied.
   virtual void StartDocument(std::string_view source, const Ref<Object> &owner) = 0;
   virtual void StartElement(std::string_view name, const AttributeEvent *attributes, std::size_t count,
                             std::uint32_t line, std::uint32_t column) = 0;
@@ -90,7 +90,7 @@ public:
   virtual void Characters(std::string_view text) = 0;
   virtual void Comment(std::string_view text) = 0;
   virtual void ProcessingInstruction(std::string_view target, std::string_view data) = 0;
-  /// What was made; called once, after the end of a well-formed document.
+  /// The result; called once, after the end of a well-formed document.
   virtual Ref<Object> TakeResult() = 0;
 
 protected:
