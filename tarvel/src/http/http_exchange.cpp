@@ -72,7 +72,7 @@ void HttpExchange::Start() {
     if (Abandon()) {
       throw;
     }
-    return; // the specification called back before it threw: that call is the outcome
+    return; // the specification called back before it threw, and that call decides the outcome
   }
   bool isCancelled = false;
   {

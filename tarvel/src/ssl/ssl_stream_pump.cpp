@@ -40,8 +40,7 @@ std::optional<std::string> DescribeLowerFailure(const Exception *exception) noex
 
 } // namespace
 
-// Always on an I/O thread: OpenSSL reports errors in a queue of the thread, and the host's threads may have entries
-// there.
+// Always on an I/O thread: each thread has an error queue of OpenSSL's, and the host's threads may have entries in theirs.
 void SSLStreamImpl::PostPump() {
   boost::asio::post(System::GetIoContext(),
                     [self = Ref(this)] { self->Advance([&self](Completions &done) { self->Pump(done); }); });
@@ -79,8 +78,8 @@ void SSLStreamImpl::AdvanceOnIoThread(Step step) noexcept {
     const Computation computing;
     boost::asio::dispatch(System::GetIoContext(), [self = Ref(this), step = std::move(step)] { self->Advance(step); });
   } catch (...) {
-    Advance(
-        [](Completions &) { throw OutOfMemoryException(); }); // here, because there is no memory to go to an I/O thread
+    // On this thread, because there is no memory to go to an I/O thread.
+    Advance([](Completions &) { throw OutOfMemoryException(); });
   }
 }
 
@@ -187,7 +186,7 @@ bool SSLStreamImpl::WaitsForBytes(Progress progress, Completions &done) {
     return false;
   }
   if (m_lowerEnded) {
-    // Otherwise an attacker that can cut the connection could shorten a message unnoticed (RFC 8446, section 6.1).
+    // Otherwise an attacker that cuts the connection could shorten a message unnoticed (RFC 8446, section 6.1).
     Fail(m_lowerWriteFailure.value_or("the server ended the connection without TLS's closing notice"), done);
     return false;
   }

@@ -34,7 +34,8 @@ public:
   ~TlsConnection() = default;
 
   /// Makes the connection. There is none when it throws.
-  /// @param host as in `SSLStream::AsyncHandshake`. @param parameter as there.
+  /// @param host as in `SSLStream::AsyncHandshake`.
+  /// @param parameter as in `SSLStream::AsyncHandshake`.
   /// @throws SSLException; the message is the reason. @throws OutOfMemoryException
   void Begin(const std::string &host, const std::string &parameter);
 
@@ -43,7 +44,7 @@ public:
   /// Forgets what earlier steps left in the thread's error queue. To be called before the steps of one turn.
   void PrepareSteps() noexcept;
 
-  /// Goes on with the handshake. DONE means that the server was accepted.
+  /// Continues the handshake. DONE means that the server was accepted.
   /// @throws OutOfMemoryException; Crypto::CryptoException when the server's certificate cannot be examined
   Progress Handshake();
 

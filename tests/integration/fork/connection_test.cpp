@@ -1,5 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
-// Connections of a parent, as its child finds them.
+// Connections of a parent process, and what its child can do with its copies.
 
 #include "integration/fork/server_process.h"
 #include "ssl/ssl_context_impl.h"
@@ -42,7 +42,7 @@ using Testing::TlsSettings;
 
 constexpr const char *OF_PARENT = "The connection belongs to the process that this one was forked from";
 
-/// Sends back what comes, until the client ends.
+/// Sends back all bytes, until the client ends the connection.
 void Echo(ServerConnection &connection) {
   connection.Handshake();
   for (std::string bytes = connection.ReadSome(); !bytes.empty(); bytes = connection.ReadSome()) {
@@ -64,7 +64,7 @@ std::string Write(System::Stream &stream, const std::string &bytes) {
   return written.GetMessage();
 }
 
-/// What came, or the message of what went wrong.
+/// The bytes that were read, or the message of the failure.
 std::string Read(System::Stream &stream) {
   std::string bytes(100, '\0');
   Completion read;
@@ -73,11 +73,12 @@ std::string Read(System::Stream &stream) {
   return failure.empty() ? bytes.substr(0, read.GetCount()) : failure;
 }
 
-/// The descriptors of this process that are of one kind, such as "socket:[4711]" or "anon_inode:[eventpoll]", by number.
+/// The descriptors of this process of one kind, such as "socket:", each as its number and its target, such as
+/// "socket:[4711]".
 std::set<std::string> DescriptorsOfKind(const std::string &kind) {
   std::set<std::string> found;
   for (const auto &entry : std::filesystem::directory_iterator("/proc/self/fd")) {
-    std::error_code gone; // the directory's own
+    std::error_code gone; // for the directory's own descriptor
     const std::string target = std::filesystem::read_symlink(entry.path(), gone).string();
     if (target.rfind(kind, 0) == 0) {
       found.insert(entry.path().filename().string() + " " + target);
@@ -86,7 +87,7 @@ std::set<std::string> DescriptorsOfKind(const std::string &kind) {
   return found;
 }
 
-/// What each epoll set of this process watches, as the kernel lists it.
+/// What each epoll set of this process watches, in the kernel's words.
 std::string DescribeEpollSets() {
   std::string described;
   for (const std::string &entry : DescriptorsOfKind("anon_inode:[eventpoll]")) {
@@ -105,7 +106,7 @@ std::string DescribeEpollSets() {
   return described;
 }
 
-TEST(SocketAfterFork, TheChildClosesItsCopiesAndTheParentsConnectionGoesOn) {
+TEST(SocketAfterFork, IsClosedInTheChildAndWorksInTheParent) {
   const ServerProcess server(Echo);
   const std::set<std::string> before = DescriptorsOfKind("socket:");
   const Ref<System::TcpClientSocket> socket = Connect(server.GetPort());
@@ -123,9 +124,9 @@ TEST(SocketAfterFork, TheChildClosesItsCopiesAndTheParentsConnectionGoesOn) {
               EXPECT_EQ(Read(*own), "mine");
             }),
             "");
-  EXPECT_EQ(DescribeEpollSets(), watched) << "nothing was taken out of the parent's epoll set, nor put into it";
+  EXPECT_EQ(DescribeEpollSets(), watched) << "nothing was removed from the parent's epoll set or added to it";
   EXPECT_EQ(Write(*socket, "parent"), "");
-  EXPECT_EQ(Read(*socket), "parent") << "and not a byte of the child's before it";
+  EXPECT_EQ(Read(*socket), "parent") << "without a byte of the child's before it";
 }
 
 /// Whether two descriptors of two processes are copies of each other.
@@ -135,7 +136,7 @@ bool AreCopies(pid_t process, int descriptor, pid_t otherProcess, int otherDescr
   return order == 0;
 }
 
-TEST(SocketAfterFork, TheChildHasNoCopyOfWhatTheParentsIoThreadsWaitWith) {
+TEST(SocketAfterFork, LeavesTheChildNoCopyOfTheIoThreadsDescriptors) {
   const ServerProcess server(Echo);
   const Ref<System::TcpClientSocket> socket = Connect(server.GetPort());
   const std::set<std::string> ofParent = DescriptorsOfKind("anon_inode:");
@@ -156,7 +157,7 @@ TEST(SocketAfterFork, TheChildHasNoCopyOfWhatTheParentsIoThreadsWaitWith) {
             "");
 }
 
-TEST(SocketAfterFork, NoCompletionOfTheParentRunsInTheChild) {
+TEST(SocketAfterFork, CallsNoCompletionOfTheParentInTheChild) {
   const ServerProcess silent([](ServerConnection &connection) { connection.Stall(); });
   const Shared<std::atomic<int>> calls;
   const auto count = [&calls](std::size_t, const Exception *) { ++*calls; };
@@ -174,7 +175,7 @@ TEST(SocketAfterFork, NoCompletionOfTheParentRunsInTheChild) {
   EXPECT_TRUE(Testing::Eventually([&] { return *calls == 1; }));
 }
 
-TEST(SocketAfterFork, AConnectOfTheParentIsNotReportedInTheChild) {
+TEST(SocketAfterFork, ReportsNoConnectOfTheParentInTheChild) {
   const Testing::FullPort silent;
   const Shared<std::atomic<int>> calls;
   const Ref<System::TcpClientSocket> socket = System::CreateTcpClientSocket();
@@ -189,7 +190,7 @@ TEST(SocketAfterFork, AConnectOfTheParentIsNotReportedInTheChild) {
   EXPECT_TRUE(Testing::Eventually([&] { return *calls == 1; }));
 }
 
-TEST(SocketAfterFork, TheChildLooksUpANameAnewThatItsParentIsLookingUp) {
+TEST(SocketAfterFork, DoesNotJoinALookupOfTheParent) {
   const ServerProcess server(Echo);
   const Shared<std::atomic<int>> calls;
   const pid_t parent = ::getpid();
@@ -217,7 +218,7 @@ TEST(SocketAfterFork, TheChildLooksUpANameAnewThatItsParentIsLookingUp) {
   EXPECT_TRUE(Testing::Eventually([&] { return *calls == 1; }));
 }
 
-TEST(SocketAfterFork, ACompletionMayForkAndTheChildMayConnect) {
+TEST(SocketAfterFork, ConnectsInAChildThatACompletionMade) {
   const ServerProcess server(Echo);
   std::string outcome = "never run";
   Testing::EventCount done;
@@ -236,8 +237,8 @@ TEST(SocketAfterFork, ACompletionMayForkAndTheChildMayConnect) {
   EXPECT_EQ(Read(*socket), "parent");
 }
 
-// The completion waits for a lock that the thread holds which forks.
-TEST(SocketAfterFork, ForkDoesNotWaitForACompletionThatWaitsForTheHost) {
+// The completion waits for a lock that the forking thread holds.
+TEST(Fork, DoesNotWaitForACompletionThatWaitsForTheHost) {
   const ServerProcess server(Echo);
   Testing::Gate gate;
   const Ref<System::TcpClientSocket> socket = System::CreateTcpClientSocket();
@@ -259,7 +260,7 @@ protected:
   }
 };
 
-TEST_P(TlsAfterFork, TheChildLeavesTheParentsConnectionAlone) {
+TEST_P(TlsAfterFork, DoesNotUseTheParentsConnectionInTheChild) {
   const ServerProcess server(Echo, Settings());
   auto client = std::make_unique<TlsClient>(CreateTrustingContext(), server.GetPort());
   ASSERT_EQ(client->Handshake(), "");
@@ -276,7 +277,7 @@ TEST_P(TlsAfterFork, TheChildLeavesTheParentsConnectionAlone) {
   EXPECT_EQ(client->Read(), "parent");
 }
 
-TEST_P(TlsAfterFork, AContextOfTheParentServesTheChildWithoutAnySessionOfTheParent) {
+TEST_P(TlsAfterFork, UsesTheParentsContextInTheChildWithoutItsSessions) {
   const ServerProcess server(Echo, Settings());
   const Ref<Ssl::SSLContext> context = CreateTrustingContext();
   const auto countSessions = [&] { return dynamic_cast<Ssl::SSLContextImpl &>(*context).GetSessions().GetSize(); };
@@ -300,11 +301,11 @@ TEST_P(TlsAfterFork, AContextOfTheParentServesTheChildWithoutAnySessionOfThePare
   };
   const std::unique_ptr<TlsClient> closed = connectAndStay();
   std::unique_ptr<TlsClient> dropped = connectAndStay();
-  ASSERT_TRUE(Testing::DrainIoThreads()); // no I/O thread holds the stream
+  ASSERT_TRUE(Testing::DrainIoThreads()); // no I/O thread holds a reference to the stream
   const std::size_t left = countSessions();
   EXPECT_EQ(RunInChild([&] {
               EXPECT_EQ(countSessions(), 0u);
-              // Their sessions are not for the child either.
+              // The sessions of these two are not for the child either.
               closed->GetStream()->Close();
               dropped.reset();
               EXPECT_EQ(countSessions(), 0u);
@@ -315,7 +316,8 @@ TEST_P(TlsAfterFork, AContextOfTheParentServesTheChildWithoutAnySessionOfThePare
   EXPECT_EQ(countSessions(), left);
 }
 
-/// Ends a child with the thread that it has: without functions of `atexit`, to which the other threads' objects are lost.
+/// Ends a child when its only thread ends. The functions of `atexit` do not run, because they need the parent's other
+/// threads.
 struct ChildEnder {
   ~ChildEnder() {
     if (isInChild) {
@@ -326,8 +328,8 @@ struct ChildEnder {
 };
 thread_local ChildEnder ender;
 
-// Both operations end in one step, of which the first handler makes a child that goes on with it.
-TEST_P(TlsAfterFork, AHandlerThatForksIsTheLastToBeCalledInTheChild) {
+// Both operations end in one step. The handler that is called first forks, and the child continues that step.
+TEST_P(TlsAfterFork, CallsNoFurtherHandlerInAChildThatAHandlerMade) {
   const ServerProcess silent(
       [](ServerConnection &connection) {
         connection.Handshake();
@@ -346,7 +348,7 @@ TEST_P(TlsAfterFork, AHandlerThatForksIsTheLastToBeCalledInTheChild) {
     }
   };
   char byte = 0;
-  const std::string much(16 * 1024 * 1024, 'x'); // more than the connection takes
+  const std::string much(16 * 1024 * 1024, 'x'); // more than the connection accepts at once
   client.GetStream()->AsyncReadSome(&byte, 1, note);
   client.GetStream()->AsyncWrite(much.data(), much.size(), note);
   client.GetStream()->Close();
@@ -359,8 +361,8 @@ TEST_P(TlsAfterFork, AHandlerThatForksIsTheLastToBeCalledInTheChild) {
 
 INSTANTIATE_TEST_SUITE_P(Versions, TlsAfterFork, testing::Values(0x0303, 0x0304));
 
-// Handshakes, which compute, in the parent while it forks.
-TEST(TlsUnderLoad, EachChildOfABusyParentConnects) {
+// The parent forks while its threads compute handshakes.
+TEST(TlsUnderLoad, ConnectsInEachChildOfABusyParent) {
   if (!Testing::MAY_FORK_WHILE_OTHERS_ALLOCATE) {
     GTEST_SKIP() << "the sanitizer's allocator may stay locked in the child";
   }

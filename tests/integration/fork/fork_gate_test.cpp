@@ -29,7 +29,7 @@ void Compute() {
   ++computed;
 }
 
-/// Lets go of what it holds once another thread waits in `fork`, and notes that it did.
+/// Holds `holder` until another thread waits in `fork`, and records the release.
 template <typename Holder>
 void HoldUntilAForkWaits(Holder &holder, Testing::EventCount &held, std::atomic<bool> &released) {
   holder.lock();
@@ -37,12 +37,12 @@ void HoldUntilAForkWaits(Holder &holder, Testing::EventCount &held, std::atomic<
   while (!IsForkUnderWay()) {
     std::this_thread::yield();
   }
-  std::this_thread::sleep_for(std::chrono::milliseconds(20)); // which a fork that does not wait does not take
+  std::this_thread::sleep_for(std::chrono::milliseconds(20)); // longer than a fork that does not wait takes
   released = true;
   holder.unlock();
 }
 
-TEST(ForkGate, ForkWaitsForAMutexThatAnotherThreadHolds) {
+TEST(ForkGate, WaitsForAMutexThatAnotherThreadHolds) {
   ForkSafeMutex mutex;
   Testing::EventCount held;
   std::atomic<bool> released{false};
@@ -56,7 +56,7 @@ TEST(ForkGate, ForkWaitsForAMutexThatAnotherThreadHolds) {
   holder.join();
 }
 
-TEST(ForkGate, ForkWaitsForAComputationThatHasBegunSeveralTimes) {
+TEST(ForkGate, WaitsForTheEndOfNestedComputations) {
   struct Twice {
     void lock() {
       outer.emplace();
@@ -77,7 +77,7 @@ TEST(ForkGate, ForkWaitsForAComputationThatHasBegunSeveralTimes) {
   computing.join();
 }
 
-TEST(ForkGate, ForkDoesNotWaitForTheHostsCodeWhateverComputationCallsIt) {
+TEST(ForkGate, DoesNotWaitForTheHostsCodeWithinComputations) {
   Testing::Gate gate;
   std::thread calling([&] {
     const Computation outer;
@@ -91,7 +91,7 @@ TEST(ForkGate, ForkDoesNotWaitForTheHostsCodeWhateverComputationCallsIt) {
   calling.join();
 }
 
-TEST(ForkGate, AThreadForksWithinItsOwnComputation) {
+TEST(ForkGate, LetsAThreadForkWithinItsOwnComputation) {
   ForkSafeMutex mutex;
   const Computation computing;
   EXPECT_EQ(RunInChild([&] {
@@ -101,7 +101,7 @@ TEST(ForkGate, AThreadForksWithinItsOwnComputation) {
             "");
 }
 
-TEST(ForkGate, AThreadForksWithinItsComputationWhileAnotherForkWaitsForIt) {
+TEST(ForkGate, LetsAThreadForkWithinAComputationThatAnotherForkWaitsFor) {
   if (!Testing::MAY_FORK_WHILE_OTHERS_ALLOCATE) {
     GTEST_SKIP() << "the sanitizer's allocator may stay locked in the child";
   }
@@ -119,8 +119,8 @@ TEST(ForkGate, AThreadForksWithinItsComputationWhileAnotherForkWaitsForIt) {
   within.join();
 }
 
-// As a module of OpenSSL may do that starts a program under a lock of its own.
-TEST(ForkGate, AForkWithinAComputationDoesNotWaitForAThreadThatWaitsForWhatItHolds) {
+// A module of OpenSSL that starts a program under a lock of its own may do so.
+TEST(ForkGate, DoesNotWaitForAThreadThatWaitsForALockOfTheForkingOne) {
   std::mutex held;
   Testing::EventCount waiting;
   std::unique_lock<std::mutex> lock(held);
@@ -136,10 +136,10 @@ TEST(ForkGate, AForkWithinAComputationDoesNotWaitForAThreadThatWaitsForWhatItHol
   }
   lock.unlock();
   other.join();
-  EXPECT_EQ(RunInChild([] { Compute(); }), "") << "later forks find nothing left behind";
+  EXPECT_EQ(RunInChild([] { Compute(); }), "") << "later forks are not affected";
 }
 
-TEST(ForkGate, NoChildFindsALockedMutexHoweverBusyTheThreadsAre) {
+TEST(ForkGate, LeavesNoMutexLockedInAChildOfABusyParent) {
   ForkSafeMutex mutex;
   std::atomic<bool> stop{false};
   std::atomic<int> rounds{0};
@@ -161,7 +161,7 @@ TEST(ForkGate, NoChildFindsALockedMutexHoweverBusyTheThreadsAre) {
   second.join();
 }
 
-TEST(ForkGate, TwoThreadsForkAtOnce) {
+TEST(ForkGate, LetsTwoThreadsForkAtOnce) {
   if (!Testing::MAY_FORK_WHILE_OTHERS_ALLOCATE) {
     GTEST_SKIP() << "the sanitizer's allocator may stay locked in the child";
   }
@@ -176,8 +176,8 @@ TEST(ForkGate, TwoThreadsForkAtOnce) {
   other.join();
 }
 
-TEST(ForkGate, EachChildCountsOneForkMoreThanItsParent) {
-  Compute(); // forks before the first computation concern nobody
+TEST(ForkGate, CountsOneForkMoreInEachChild) {
+  Compute(); // forks before the first computation do not count
   const unsigned own = GetForkGeneration();
   EXPECT_EQ(RunInChild([&] {
               EXPECT_EQ(GetForkGeneration(), own + 1);
@@ -188,7 +188,7 @@ TEST(ForkGate, EachChildCountsOneForkMoreThanItsParent) {
 }
 
 // Handlers that were registered first run last before a fork, and first after it.
-TEST(ForkGate, ForkHandlersOfTheHostMayComputeOnTheThreadThatForks) {
+TEST(ForkGate, LetsForkHandlersOfTheHostCompute) {
   static const bool areRegistered = [] {
     const bool before = pthread_atfork(Compute, Compute, Compute) == 0;
     Compute(); // registers the gate's handlers, unless an earlier test did

@@ -1,5 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
-// Functions of the host that the platform calls: fork waits for none of them, for they may wait for the thread that forks.
+// Functions of the host that the platform calls. Fork does not wait for them, because they may wait for the forking
+// thread.
 
 #include "core/fork_gate.h"
 #include "support/data_file.h"
@@ -28,7 +29,7 @@ namespace {
 using Testing::Gate;
 using Testing::RunInChild;
 
-/// What the child of a parent does whose other thread waits at `gate`: the fork returns, and the child goes its way.
+/// Expects that this thread can fork while another one waits at `gate`, and that the child can run `inChild`.
 void ExpectForkWhileHeldAt(
     Gate &gate, const std::function<void()> &inChild = [] {}) {
   ASSERT_TRUE(gate.WaitForArrivals(1));
@@ -36,12 +37,12 @@ void ExpectForkWhileHeldAt(
   gate.Open();
 }
 
-TEST(ForkBesideTheHostsCode, DoesNotWaitForALogSink) {
+TEST(ForkDuringTheHostsCode, DoesNotWaitForALogSink) {
   Gate gate;
   const Ref<Service::LogRoot> root = Service::GetApp().GetRootLogger();
   root->SetSink([&gate](const Service::LogRecord &) { gate.Pass(); });
   std::thread logging([&root] {
-    const Computation computing; // as when the platform itself logs
+    const Computation computing; // the platform itself logs within computations
     root->Write(Service::LogRecord{});
   });
   ExpectForkWhileHeldAt(gate);
@@ -49,7 +50,7 @@ TEST(ForkBesideTheHostsCode, DoesNotWaitForALogSink) {
   root->SetSink(nullptr);
 }
 
-TEST(ForkBesideTheHostsCode, DoesNotWaitForAPassphrase) {
+TEST(ForkDuringTheHostsCode, DoesNotWaitForAPassphrase) {
   Gate gate;
   std::thread loading([&gate] {
     EXPECT_THROW(static_cast<void>(Crypto::LoadPrivateKey("file:" + Testing::DataPath("crypto/p256-encrypted.key"),
@@ -63,7 +64,7 @@ TEST(ForkBesideTheHostsCode, DoesNotWaitForAPassphrase) {
   loading.join();
 }
 
-TEST(ForkBesideTheHostsCode, DoesNotWaitForTheCompletionOfARequest) {
+TEST(ForkDuringTheHostsCode, DoesNotWaitForTheCompletionOfARequest) {
   if (!Testing::MAY_FORK_WHILE_OTHERS_ALLOCATE) {
     GTEST_SKIP() << "the sanitizer's allocator may stay locked in the child";
   }
@@ -72,16 +73,11 @@ TEST(ForkBesideTheHostsCode, DoesNotWaitForTheCompletionOfARequest) {
   const std::string url = server.GetUrl();
   const std::string port = url.substr(url.rfind(':') + 1, url.rfind('/') - url.rfind(':') - 1);
   SsoClient::CreateSsoConnectionSpec("localhost", std::stoi(port), false, spec);
-  Ref<Http::CookieStore> cookies;
-  Http::CreateCookieStore("", cookies);
-  Ref<Http::UserAgent> agent;
-  Http::CreateHttpUserAgent(spec, cookies, nullptr, agent);
-  Ref<Http::ClientRequest> request;
-  Http::CreateHttpRequest("POST", "/sts", request);
+  const Ref<Http::UserAgent> agent = Http::CreateHttpUserAgent(spec, Http::CreateCookieStore());
   Gate gate;
   Ref<Http::PendingRequestItem> pending;
   agent->StartRequest(
-      request,
+      Http::CreateHttpRequest("POST", "/sts"),
       [&gate](const Exception *, const Ref<Http::ClientResponse> &, const Ref<Http::PendingRequestItem> &) {
         gate.Pass();
       },
@@ -92,7 +88,7 @@ TEST(ForkBesideTheHostsCode, DoesNotWaitForTheCompletionOfARequest) {
   EXPECT_EQ(response->GetStatusCode(), 200);
 }
 
-/// A handler that is held while a document is parsed.
+/// A handler that waits at a gate while a document is parsed.
 class HeldHandler final : public Xml::XMLHandler {
 public:
   explicit HeldHandler(Gate &gate) : m_gate(gate) {}
@@ -115,7 +111,7 @@ Ref<Object> Parse(const Ref<Xml::XMLHandler> &handler) {
   return Xml::CreateXMLParser(handler)->Parse(*CreateStringReader("<a/>"));
 }
 
-TEST(ForkBesideTheHostsCode, DoesNotWaitForTheHandlerOfAParse) {
+TEST(ForkDuringTheHostsCode, DoesNotWaitForTheHandlerOfAParse) {
   Gate gate;
   std::thread parsing([&gate] { Parse(MakeRef<HeldHandler>(gate)); });
   ExpectForkWhileHeldAt(gate, [] { EXPECT_TRUE(Parse(Xml::CreateXMLDocumentHandler())); });

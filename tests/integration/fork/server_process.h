@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// `ServerProcess`, a scripted server in a process of its own, so that no child of the test inherits its connections, nor
+/// `ServerProcess`, a scripted server in a separate process, so that no child of the test inherits its connections or
 /// its threads' use of OpenSSL.
 
 #pragma once

@@ -1,5 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
-// A service of the parent, used by its child while the parent's operations are under way.
+// A service of the parent process, used by its child while the parent's operations are under way.
 
 #include "integration/fork/server_process.h"
 #include "support/data_file.h"
@@ -38,7 +38,7 @@ using TokenPtr = std::shared_ptr<const SamlToken>;
 
 constexpr const char *SUBJECT = "{Name: alice; Domain:corp.example}";
 
-/// Answers each request with a token, but holds back the answer to users whose name says so.
+/// Answers each request with a token. The answer to the user "slow" waits for `Answer`.
 class Service {
 public:
   explicit Service(bool isSecure)
@@ -54,7 +54,7 @@ public:
   }
   int GetPort() const { return m_server.GetPort(); }
 
-  /// Whether that many requests have come whose answers are held back.
+  /// Waits for `count` requests whose answers are held back. Returns false if they do not arrive in time.
   bool WaitForHeld(int count) const {
     return Testing::Eventually([this, count] { return *m_held >= count; });
   }
@@ -91,8 +91,8 @@ std::string Acquire(const SecurityTokenService &service, const std::string &user
   return service.AcquireToken(user, "pass", Spec())->GetSubject().ToString();
 }
 
-/// What the completion of one asynchronous operation was called with.
-class Told {
+/// The outcome of one asynchronous operation.
+class Outcome {
 public:
   SecurityTokenService::TokenCompletion ForToken() const {
     return [state = m_state](const TokenPtr &token, const Exception *failure) {
@@ -111,9 +111,9 @@ private:
 };
 
 std::string AcquireAsync(const SecurityTokenService &service) {
-  const Told told;
-  service.AcquireTokenAsync("alice@corp.example", "pass", Spec(), told.ForToken());
-  return told.Get();
+  const Outcome outcome;
+  service.AcquireTokenAsync("alice@corp.example", "pass", Spec(), outcome.ForToken());
+  return outcome.Get();
 }
 
 class ServiceAfterFork : public testing::TestWithParam<bool> {
@@ -123,7 +123,7 @@ protected:
   const std::shared_ptr<const SecurityTokenService> m_service = CreateSecurityTokenService(m_config);
 };
 
-TEST_P(ServiceAfterFork, TheChildOfAParentThatHasAcquiredAcquires) {
+TEST_P(ServiceAfterFork, AcquiresInTheChildOfAParentThatHasAcquired) {
   ASSERT_EQ(Acquire(*m_service), SUBJECT);
   ASSERT_EQ(AcquireAsync(*m_service), SUBJECT);
   EXPECT_EQ(RunInChild([&] {
@@ -137,7 +137,7 @@ TEST_P(ServiceAfterFork, TheChildOfAParentThatHasAcquiredAcquires) {
   EXPECT_EQ(AcquireAsync(*m_service), SUBJECT);
 }
 
-TEST_P(ServiceAfterFork, TheChildAcquiresWhileItsParentsOperationsAreUnderWayAndHearsNothingOfThem) {
+TEST_P(ServiceAfterFork, AcquiresInTheChildDuringTheParentsOperationsWithoutTheirCompletions) {
   const Shared<std::atomic<int>> callsInChildren;
   const pid_t parent = ::getpid();
   Testing::EventCount done;
@@ -159,7 +159,7 @@ TEST_P(ServiceAfterFork, TheChildAcquiresWhileItsParentsOperationsAreUnderWayAnd
               "");
   }
   const pid_t late = Testing::StartChild([&] {
-    // The answers to the parent come while this child works.
+    // The answers to the parent arrive while this child works.
     m_server.Answer();
     for (int i = 0; i < 10; ++i) {
       EXPECT_EQ(Acquire(*m_service), SUBJECT);
@@ -171,7 +171,7 @@ TEST_P(ServiceAfterFork, TheChildAcquiresWhileItsParentsOperationsAreUnderWayAnd
   EXPECT_EQ(*callsInChildren, 0);
 }
 
-TEST_P(ServiceAfterFork, ACompletionMayForkAndTheChildMayAcquire) {
+TEST_P(ServiceAfterFork, AcquiresInAChildThatACompletionMade) {
   std::string outcome = "never run";
   Testing::EventCount done;
   m_service->AcquireTokenAsync("alice@corp.example", "pass", Spec(), [&](const TokenPtr &, const Exception *) {
@@ -186,7 +186,7 @@ TEST_P(ServiceAfterFork, ACompletionMayForkAndTheChildMayAcquire) {
   EXPECT_EQ(AcquireAsync(*m_service), SUBJECT);
 }
 
-/// Forks in its first leg; the child goes on with the acquisition that its parent began.
+/// Forks in its first leg. The child continues the acquisition that its parent began.
 class ForkingHandler final : public NegotiationHandler {
 public:
   explicit ForkingHandler(pid_t &child) : m_child(child) {}
@@ -199,8 +199,8 @@ private:
   pid_t &m_child;
 };
 
-// The service's answer is no leg, which both find once their requests have been answered.
-TEST_P(ServiceAfterFork, BothProcessesGoOnWithAnOperationWhoseHandlerForks) {
+// The service's answer is not a leg, which both processes report when their requests have been answered.
+TEST_P(ServiceAfterFork, ContinuesInBothProcessesWhenTheHandlerForks) {
   pid_t child = -1;
   ForkingHandler handler(child);
   const testing::AssertionResult refused = Testing::ThrowsMessage<SsoException>(
@@ -213,7 +213,7 @@ TEST_P(ServiceAfterFork, BothProcessesGoOnWithAnOperationWhoseHandlerForks) {
   EXPECT_EQ(Testing::WaitForChild(child), "");
 }
 
-TEST_P(ServiceAfterFork, EachChildOfABusyParentVerifiesAndAcquires) {
+TEST_P(ServiceAfterFork, VerifiesAndAcquiresInEachChildOfABusyParent) {
   if (!Testing::MAY_FORK_WHILE_OTHERS_ALLOCATE) {
     GTEST_SKIP() << "the sanitizer's allocator may stay locked in the child";
   }
@@ -245,11 +245,10 @@ TEST_P(ServiceAfterFork, EachChildOfABusyParentVerifiesAndAcquires) {
 INSTANTIATE_TEST_SUITE_P(Transport, ServiceAfterFork, testing::Bool(),
                          [](const auto &isSecure) { return isSecure.param ? "Tls" : "PlainHttp"; });
 
-/// A request to `port` that nobody answers, and that has begun.
+/// A request that has been started and that `server` does not answer yet.
 Ref<Tarvel::Http::PendingRequestItem> StartSlowRequest(const Service &server, const Ref<Tarvel::Http::UserAgent> &agent,
                                                        const Shared<std::atomic<int>> &calls) {
-  Ref<Tarvel::Http::ClientRequest> request;
-  Tarvel::Http::CreateHttpRequest("POST", "/sts", request);
+  const Ref<Tarvel::Http::ClientRequest> request = Tarvel::Http::CreateHttpRequest("POST", "/sts");
   request->WriteBody("slow@corp.example");
   Ref<Tarvel::Http::PendingRequestItem> pending;
   agent->StartRequest(
@@ -261,15 +260,12 @@ Ref<Tarvel::Http::PendingRequestItem> StartSlowRequest(const Service &server, co
   return pending;
 }
 
-TEST(RequestAfterFork, AWaitInTheChildForARequestOfTheParentEndsAtOnce) {
+TEST(RequestAfterFork, EndsAWaitInTheChildAtOnce) {
   const Service server(false);
   const Shared<std::atomic<int>> calls;
   Ref<Tarvel::Http::ConnectionSpec> spec;
   CreateSsoConnectionSpec("localhost", server.GetPort(), false, spec);
-  Ref<Tarvel::Http::CookieStore> cookies;
-  Tarvel::Http::CreateCookieStore("", cookies);
-  Ref<Tarvel::Http::UserAgent> agent;
-  Tarvel::Http::CreateHttpUserAgent(spec, cookies, nullptr, agent);
+  const auto agent = Tarvel::Http::CreateHttpUserAgent(spec, Tarvel::Http::CreateCookieStore());
   const Ref<Tarvel::Http::PendingRequestItem> pending = StartSlowRequest(server, agent, calls);
   Ref<Tarvel::Http::ClientResponse> response;
   EXPECT_EQ(RunInChild([&] {

@@ -21,17 +21,17 @@ using Testing::Gate;
 using Testing::RunInChild;
 using Testing::Shared;
 
-/// Whether the pool runs an item now.
+/// Whether the pool still runs items.
 bool Runs(ThreadPool &pool) {
   const auto ran = std::make_shared<EventCount>();
   pool.QueueWorkItem([ran] { ran->Add(); });
   return ran->WaitFor(1);
 }
 
-TEST(ThreadPoolAfterFork, AChildHasThreadsOfItsOwnForThePoolsOfItsParent) {
+TEST(ThreadPoolAfterFork, StartsItsOwnThreadsInTheChild) {
   const Ref<ThreadPool> own = CreateThreadPool(2);
   ASSERT_TRUE(Runs(*own));
-  ASSERT_TRUE(Runs(*GetThreadPool())); // so that it has an idle thread, which the child has not
+  ASSERT_TRUE(Runs(*GetThreadPool())); // so that it has an idle thread, which does not exist in the child
   EXPECT_EQ(RunInChild([&] {
               EXPECT_EQ(own->GetThreadCount(), 0u);
               EXPECT_EQ(own->GetThreadCeiling(), 2u);
@@ -44,7 +44,7 @@ TEST(ThreadPoolAfterFork, AChildHasThreadsOfItsOwnForThePoolsOfItsParent) {
   EXPECT_TRUE(Runs(*own));
 }
 
-TEST(ThreadPoolAfterFork, NothingThatTheParentHasQueuedRunsInTheChild) {
+TEST(ThreadPoolAfterFork, RunsNoItemOfTheParentInTheChild) {
   const Shared<std::atomic<int>> runs;
   const Ref<ThreadPool> pool = CreateThreadPool(1);
   const auto gate = std::make_shared<Gate>();
@@ -69,7 +69,7 @@ TEST(ThreadPoolAfterFork, NothingThatTheParentHasQueuedRunsInTheChild) {
   EXPECT_TRUE(Testing::Eventually([&] { return *runs == 2; }));
 }
 
-TEST(ThreadPoolAfterFork, WhatAQueuedItemHoldsGoesInTheChildThatUsesThePool) {
+TEST(ThreadPoolAfterFork, ReleasesTheParentsQueuedItemsInTheChild) {
   const Ref<ThreadPool> pool = CreateThreadPool(1);
   const auto gate = std::make_shared<Gate>();
   pool->QueueWorkItem([gate] { gate->Pass(); });
@@ -86,7 +86,7 @@ TEST(ThreadPoolAfterFork, WhatAQueuedItemHoldsGoesInTheChildThatUsesThePool) {
   gate->Open();
 }
 
-TEST(ThreadPoolAfterFork, AnItemMayForkAndTheChildMayUseThePool) {
+TEST(ThreadPoolAfterFork, RunsItemsInAChildThatAnItemMade) {
   const auto outcome = std::make_shared<std::string>("never run");
   EventCount done;
   GetThreadPool()->QueueWorkItem([outcome, &done] {
@@ -98,7 +98,7 @@ TEST(ThreadPoolAfterFork, AnItemMayForkAndTheChildMayUseThePool) {
   EXPECT_TRUE(Runs(*GetThreadPool()));
 }
 
-TEST(ThreadPoolAfterFork, TheChildsCopyOfAPoolIsDroppedWithoutWaitingForTheParentsThreads) {
+TEST(ThreadPoolAfterFork, IsDestroyedInTheChildWithoutWaitingForTheParentsThreads) {
   Ref<ThreadPool> pool = CreateThreadPool(2);
   const auto gate = std::make_shared<Gate>();
   pool->QueueWorkItem([gate] { gate->Pass(); });

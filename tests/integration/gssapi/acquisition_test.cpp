@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
-// Tokens for Kerberos tickets, over TLS from the development service, which accepts by the system's GSSAPI: with the ready
-// handler, and leg by leg.
+// Tokens for Kerberos tickets, over TLS from the development service, which accepts them with the system's GSSAPI. They
+// are acquired with the library's handler, or leg by leg.
 
 #include "integration/gssapi/service_world.h"
 #include "support/process_resources.h"
@@ -33,7 +33,7 @@ SpnegoSettings DceStyle() {
   return settings;
 }
 
-/// Whether the pool has let go of it: the GSSAPI must not be in use when the process ends.
+/// Waits until the pool has released `handler`: the GSSAPI must not be in use when the process ends.
 bool IsReleased(const std::shared_ptr<SpnegoHandler> &handler) {
   return Testing::Eventually([&handler] { return handler.use_count() == 1; });
 }
@@ -46,7 +46,7 @@ std::size_t CountIn(const std::string &text, const std::string &word) {
   return count;
 }
 
-TEST(GssAcquisition, GivesABearerTokenForATicket) {
+TEST(GssAcquisition, ReturnsABearerTokenForATicket) {
   const ServiceWorld world;
   const auto handler = CreateSpnegoHandler(SettingsFor());
   const auto token = CreateSecurityTokenService(world.MakeConfig())->AcquireTokenByGSS(HourSpec(), *handler);
@@ -55,7 +55,7 @@ TEST(GssAcquisition, GivesABearerTokenForATicket) {
   EXPECT_TRUE(handler->IsMutuallyAuthenticated());
 }
 
-TEST(GssAcquisition, GivesAHolderOfKeyTokenToWhomHasAKeyBesides) {
+TEST(GssAcquisition, ReturnsAHolderOfKeyTokenToAClientThatAlsoHasAKey) {
   const ServiceWorld world;
   const auto handler = CreateSpnegoHandler(SettingsFor());
   const SecurityTokenServiceConfig config = world.MakeConfig("", "client");
@@ -92,7 +92,7 @@ TEST(GssAcquisition, CarriesTextBeyondAsciiToAndFromAServiceInLatin1) {
   }
 }
 
-TEST(GssAcquisition, AsksForWhatTheSpecSaysOverSeveralLegs) {
+TEST(GssAcquisition, KeepsTheSpecOverSeveralLegs) {
   const ServiceWorld world;
   TokenSpec spec = HourSpec();
   spec.renewable = true;
@@ -106,7 +106,7 @@ TEST(GssAcquisition, AsksForWhatTheSpecSaysOverSeveralLegs) {
   EXPECT_EQ(token->GetEndDate().GetUtcTime() - token->GetStartDate().GetUtcTime(), std::int64_t{3600} * 1000000);
 }
 
-TEST(GssAcquisition, TakesTwoMessagesInDceStyle) {
+TEST(GssAcquisition, NeedsTwoMessagesInDceStyle) {
   const ServiceWorld world;
   const auto handler = CreateSpnegoHandler(DceStyle());
   const auto token = CreateSecurityTokenService(world.MakeConfig())->AcquireTokenByGSS(HourSpec(), *handler);
@@ -116,7 +116,7 @@ TEST(GssAcquisition, TakesTwoMessagesInDceStyle) {
   EXPECT_EQ(CountIn(world.GetService().GetLog(), ": negotiated, issued"), 1u);
 }
 
-TEST(GssAcquisition, RunsOnThePoolAsWell) {
+TEST(GssAcquisition, AlsoRunsOnThePool) {
   const ServiceWorld world;
   const auto handler = CreateSpnegoHandler(SettingsFor());
   const auto service = CreateSecurityTokenService(world.MakeConfig());
@@ -158,7 +158,7 @@ TEST(GssAcquisition, RunsOnSeveralThreadsAtOnce) {
   }
 }
 
-TEST(GssAcquisition, TellsOfMissingCredentialsOnThePoolAsItsOwnClass) {
+TEST(GssAcquisition, ReportsMissingCredentialsOnThePoolInTheirOwnClass) {
   const ServiceWorld world;
   SpnegoSettings settings = SettingsFor();
   settings.credentialCache = world.GetRealm().NameFile("no_such_cache");
@@ -173,7 +173,7 @@ TEST(GssAcquisition, TellsOfMissingCredentialsOnThePoolAsItsOwnClass) {
   ASSERT_TRUE(IsReleased(handler));
 }
 
-TEST(GssNegotiationByHand, TakesOneMessage) {
+TEST(GssNegotiationByHand, NeedsOneMessage) {
   const ServiceWorld world;
   const auto handler = CreateSpnegoHandler(SettingsFor());
   int legs = 0;
@@ -182,7 +182,7 @@ TEST(GssNegotiationByHand, TakesOneMessage) {
   EXPECT_EQ(legs, 1);
 }
 
-TEST(GssNegotiationByHand, TakesTwoMessagesInDceStyle) {
+TEST(GssNegotiationByHand, NeedsTwoMessagesInDceStyle) {
   const ServiceWorld world;
   const auto handler = CreateSpnegoHandler(DceStyle());
   int legs = 0;
@@ -191,7 +191,7 @@ TEST(GssNegotiationByHand, TakesTwoMessagesInDceStyle) {
   EXPECT_EQ(legs, 2);
 }
 
-TEST(GssNegotiationByHand, GivesAHolderOfKeyTokenToWhomHasAKeyBesides) {
+TEST(GssNegotiationByHand, ReturnsAHolderOfKeyTokenToAClientThatAlsoHasAKey) {
   const ServiceWorld world;
   const auto handler = CreateSpnegoHandler(DceStyle());
   int legs = 0;
@@ -208,7 +208,7 @@ TEST(GssAcquisition, IsRefusedToAClientThatTheServiceDoesNotKnow) {
                         InvalidCredentialsException, "Authentication failed: unknown user mallory@CORP.EXAMPLE");
 }
 
-TEST(GssAcquisition, IsRefusedForATicketOfAServiceWhoseKeyThisOneHasNot) {
+TEST(GssAcquisition, IsRefusedForATicketOfAnotherService) {
   const ServiceWorld world;
   world.GetRealm().AddPrincipal("other/localhost");
   const auto handler = CreateSpnegoHandler(SettingsFor("other@localhost"));
@@ -217,7 +217,7 @@ TEST(GssAcquisition, IsRefusedForATicketOfAServiceWhoseKeyThisOneHasNot) {
                           "other/localhost@CORP.EXAMPLE");
 }
 
-TEST(GssAcquisition, IsRefusedWhenTheServicesClockIsFarFromTheRealms) {
+TEST(GssAcquisition, IsRefusedWhenTheClocksOfServiceAndRealmDiffer) {
   const ServiceWorld world({.name = "CORP.EXAMPLE", .clockOffsetSec = -1000, .adoptsClock = true});
   const auto handler = CreateSpnegoHandler(SettingsFor());
   EXPECT_FAILS_WITH_WORDS(CreateSecurityTokenService(world.MakeConfig())->AcquireTokenByGSS(HourSpec(), *handler),
@@ -236,7 +236,7 @@ TEST(GssAcquisition, SendsNothingWithoutATicket) {
   EXPECT_EQ(world.GetService().GetLog(), "");
 }
 
-TEST(GssAcquisition, FailsWhenTheFinalLegIsGarbageThoughTheTokenIsGood) {
+TEST(GssAcquisition, FailsWhenTheFinalLegIsGarbageEvenIfTheTokenIsValid) {
   const ServiceWorld world;
   const auto handler = CreateSpnegoHandler(SettingsFor());
   EXPECT_FAILS_WITH_WORDS(
@@ -250,10 +250,10 @@ TEST(GssAcquisition, FailsWhenALegInTheMiddleIsGarbage) {
   EXPECT_FAILS_WITH_WORDS(
       CreateSecurityTokenService(world.MakeConfig("garbage-leg"))->AcquireTokenByGSS(HourSpec(), *handler),
       GssNegotiationException, "The negotiation with sts@localhost failed: ", "Invalid token was supplied");
-  EXPECT_EQ(CountIn(world.GetService().GetLog(), "\n"), 1u) << "one message, and no second";
+  EXPECT_EQ(CountIn(world.GetService().GetLog(), "\n"), 1u) << "exactly one message";
 }
 
-TEST(GssAcquisition, LeavesAServiceWithoutFinalLegToTheCallersJudgement) {
+TEST(GssAcquisition, ReturnsATokenOfAServiceThatSendsNoFinalLeg) {
   const ServiceWorld world;
   const auto handler = CreateSpnegoHandler(SettingsFor());
   const auto token = CreateSecurityTokenService(world.MakeConfig("no-leg"))->AcquireTokenByGSS(HourSpec(), *handler);
@@ -270,7 +270,7 @@ TEST(GssAcquisition, FailsWhenALegInTheMiddleIsMissing) {
                         SsoException, "Unexpected XML format");
 }
 
-TEST(GssAcquisition, FailsWhenTheServiceChangesToAContextThatItDoesNotKnow) {
+TEST(GssAcquisition, FailsWhenTheServiceChangesToAnUnknownContext) {
   const ServiceWorld world;
   const auto handler = CreateSpnegoHandler(DceStyle());
   EXPECT_THROWS_MESSAGE(
@@ -279,7 +279,7 @@ TEST(GssAcquisition, FailsWhenTheServiceChangesToAContextThatItDoesNotKnow) {
   EXPECT_EQ(CountIn(world.GetService().GetLog(), "no negotiation with that context is waiting for a leg"), 1u);
 }
 
-TEST(GssAcquisition, FailsWhenTheServiceNamesNoContext) {
+TEST(GssAcquisition, FailsWhenTheServiceSendsNoContext) {
   const ServiceWorld world;
   const auto handler = CreateSpnegoHandler(SettingsFor());
   EXPECT_THROWS_MESSAGE(
@@ -297,7 +297,7 @@ TEST(GssAcquisition, FailsWhenTheServiceTakesLongerThanTheHandlerAllows) {
       GssLimitException, "The negotiation with sts@localhost reached its time limit: 1 s");
 }
 
-TEST(GssAcquisition, IsRefusedByAServiceWithoutKeytab) {
+TEST(GssAcquisition, IsRefusedByAServiceWithoutAKeytab) {
   const ServiceWorld world;
   const Testing::DevSts service;
   SecurityTokenServiceConfig config = world.MakeConfig();
@@ -307,7 +307,7 @@ TEST(GssAcquisition, IsRefusedByAServiceWithoutKeytab) {
                         "Unexpected SOAP fault: wst:RequestFailed; request failed.");
 }
 
-TEST(DevelopmentService, DoesNotStartWithAKeytabThatIsNone) {
+TEST(DevelopmentService, DoesNotStartWithANonExistentKeytab) {
   const Testing::KerberosRealm realm;
   try {
     const Testing::DevSts service({"--keytab", (realm.GetFolder() / "no.keytab").string()});

@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
-// No credentials, or none that the realm takes: told before anything goes to the service, and without falling back to
-// other credentials that happen to be there.
+// No credentials, or credentials that the realm refuses. This is reported before anything is sent to the service, and
+// other credentials that exist are not used instead.
 
 #include "integration/gssapi/negotiation_fixture.h"
 #include "support/throws_message.h"
@@ -26,7 +26,7 @@ TEST(Credentials, AreMissingWithoutATicket) {
                           "No credentials in the default credential cache: ", "No Kerberos credentials available");
 }
 
-TEST(Credentials, AreToldWithMajorAndMinorText) {
+TEST(Credentials, AreReportedMissingWithMajorAndMinorText) {
   const RealmWithAlice world;
   EXPECT_FAILS_WITH_WORDS(
       MakeFirstLeg(SettingsFor()), GssCredentialException,
@@ -35,7 +35,7 @@ TEST(Credentials, AreToldWithMajorAndMinorText) {
       world.realm.GetDefaultCache().substr(5));
 }
 
-TEST(Credentials, AreMissingInANamedCacheThoughTheDefaultOneHasSome) {
+TEST(Credentials, AreMissingInANamedCacheEvenIfTheDefaultCacheHasSome) {
   const RealmWithAlice world;
   world.LogIn();
   SpnegoSettings settings = SettingsFor();
@@ -45,7 +45,7 @@ TEST(Credentials, AreMissingInANamedCacheThoughTheDefaultOneHasSome) {
                           "No credentials cache found");
 }
 
-TEST(Credentials, AreMissingInACacheThatIsNone) {
+TEST(Credentials, AreMissingInACacheThatIsNotValid) {
   const RealmWithAlice world;
   world.LogIn();
   std::ofstream(world.realm.GetFolder() / "garbage") << "this is not a cache at all, whatever its name says";
@@ -64,7 +64,7 @@ TEST(Credentials, AreMissingInACacheOfAnUnknownKind) {
                           "No credentials in the credential cache NOWHERE:cache: ", "Unknown credential cache type");
 }
 
-TEST(Credentials, AreMissingForAClientThatTheCacheDoesNotKnow) {
+TEST(Credentials, AreMissingForAClientThatIsNotInTheCache) {
   const RealmWithAlice world;
   world.LogIn();
   SpnegoSettings settings = SettingsFor();
@@ -73,15 +73,15 @@ TEST(Credentials, AreMissingForAClientThatTheCacheDoesNotKnow) {
                           "No credentials in the default credential cache for bob@EXAMPLE.TEST: ", "bob@EXAMPLE.TEST");
 }
 
-TEST(Credentials, HaveExpiredWithTheTicket) {
-  // A clock that is two hours behind gives a ticket for one hour, which has expired an hour ago by everybody else's.
+TEST(Credentials, ExpireWithTheTicket) {
+  // A ticket for one hour, from a clock that is two hours late, expired an hour ago by all other clocks.
   const RealmWithAlice world({.clockOffsetSec = -7200, .adoptsClock = false});
   world.LogIn();
   EXPECT_THROWS_MESSAGE(MakeFirstLeg(SettingsFor()), GssCredentialException,
                         "The ticket in the default credential cache has expired");
 }
 
-TEST(Credentials, AreMissingWithoutTheKeytabThoughTheDefaultCacheHasSome) {
+TEST(Credentials, AreMissingWithoutTheKeytabEvenIfTheDefaultCacheHasSome) {
   const RealmWithAlice world;
   world.LogIn();
   SpnegoSettings settings = SettingsFor();
@@ -90,7 +90,7 @@ TEST(Credentials, AreMissingWithoutTheKeytabThoughTheDefaultCacheHasSome) {
                           "No credentials in the keytab " + settings.clientKeytab + ": ", "No");
 }
 
-TEST(Credentials, AreRefusedWithAKeyThatIsNoLongerTheClients) {
+TEST(Credentials, AreRefusedWithAnOldKeyOfTheClient) {
   const RealmWithAlice world;
   world.realm.ChangeKey("alice");
   SpnegoSettings settings = SettingsFor();
@@ -109,7 +109,7 @@ TEST(Credentials, AreMissingForAClientWhoseKeyIsNotInTheKeytab) {
                           "No credentials in the keytab " + settings.clientKeytab + " for bob@EXAMPLE.TEST: ", "No");
 }
 
-TEST(Credentials, CannotBeHadWhenTheRealmDoesNotAnswer) {
+TEST(Credentials, AreUnavailableWhenTheRealmDoesNotAnswer) {
   RealmWithAlice world;
   world.realm.Stop();
   SpnegoSettings settings = SettingsFor();
@@ -119,7 +119,7 @@ TEST(Credentials, CannotBeHadWhenTheRealmDoesNotAnswer) {
                           "Cannot contact any KDC for realm 'EXAMPLE.TEST'");
 }
 
-TEST(Credentials, AreRefusedWhenTheRealmsClockIsFarFromOurs) {
+TEST(Credentials, AreRefusedWhenTheRealmsClockDiffers) {
   const RealmWithAlice world({.clockOffsetSec = 3600, .adoptsClock = false});
   SpnegoSettings settings = SettingsFor();
   settings.clientKeytab = world.userKeytab;
@@ -127,7 +127,7 @@ TEST(Credentials, AreRefusedWhenTheRealmsClockIsFarFromOurs) {
                           "No credentials in the keytab " + settings.clientKeytab + ": ", "Clock skew too great");
 }
 
-TEST(Credentials, CannotBeHadWithABrokenConfiguration) {
+TEST(Credentials, AreUnavailableWithABrokenConfiguration) {
   const RealmWithAlice world;
   SpnegoSettings settings = SettingsFor();
   settings.clientKeytab = world.userKeytab;
@@ -136,7 +136,7 @@ TEST(Credentials, CannotBeHadWithABrokenConfiguration) {
                           "Improper format of Kerberos configuration file");
 }
 
-TEST(Credentials, AreNoneOnceTheNegotiationHasFailed) {
+TEST(Credentials, AreNotUsedAfterTheNegotiationHasFailed) {
   const RealmWithAlice world;
   const auto handler = CreateSpnegoHandler(SettingsFor());
   EXPECT_THROW(handler->NegotiateLeg({}), GssCredentialException);
@@ -145,7 +145,7 @@ TEST(Credentials, AreNoneOnceTheNegotiationHasFailed) {
                         "The negotiation with sts@localhost has already failed");
 }
 
-TEST(Credentials, AreReportedAsRefusedCredentialsAreEverywhere) {
+TEST(Credentials, AreReportedAsInvalidCredentials) {
   const RealmWithAlice world;
   EXPECT_THROW(MakeFirstLeg(SettingsFor()), InvalidCredentialsException);
 }

@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// `GssAcceptor`, the service's part of one negotiation, in this process: the GSSAPI's own.
+/// `GssAcceptor`, the service's part of one negotiation, done by the GSSAPI in this process.
 
 #pragma once
 
@@ -15,18 +15,18 @@ namespace Testing {
 
 class GssAcceptor {
 public:
-  /// @param keytab as "FILE:…"
-  /// @param folder for the cache that tells replays
+  /// @param keytab in the form "FILE:…"
+  /// @param folder for the cache that detects replays
   GssAcceptor(const std::string &keytab, const std::filesystem::path &folder);
 
-  /// Takes the client's leg.
-  /// @return the service's; also after a failure there may be one, which tells the client of it.
+  /// Accepts the client's leg.
+  /// @return the service's leg; after a failure there may be one too, which reports it to the client.
   std::vector<std::uint8_t> Accept(const std::vector<std::uint8_t> &leg);
 
   bool IsComplete() const noexcept { return m_isComplete; }
-  /// As "alice@EXAMPLE.TEST"; empty before the negotiation is complete.
+  /// For example "alice@EXAMPLE.TEST"; empty before the negotiation is complete.
   const std::string &GetClient() const noexcept { return m_client; }
-  /// What the GSSAPI says of the failure; empty for none.
+  /// The GSSAPI's text about the failure; empty without one.
   const std::string &GetFailure() const noexcept { return m_failure; }
   bool HasDelegatedCredential() const noexcept { return m_delegated.Get() != nullptr; }
 

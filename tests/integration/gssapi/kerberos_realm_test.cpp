@@ -1,5 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
-// The tests' own key distribution centre ends with them, however they end.
+// The tests' own key distribution centre ends with them, in whatever way they end.
 
 #include "support/kerberos_realm.h"
 
@@ -17,7 +17,7 @@
 namespace Testing {
 namespace {
 
-TEST(KerberosRealm, LeavesNothingBehind) {
+TEST(KerberosRealm, LeavesNoProcessFileOrVariable) {
   pid_t centre = -1;
   std::filesystem::path folder;
   {
@@ -33,13 +33,13 @@ TEST(KerberosRealm, LeavesNothingBehind) {
   EXPECT_EQ(std::getenv("KRB5_CONFIG"), nullptr);
 }
 
-/// What a process tells that has a realm.
+/// What a process with a realm reports about it.
 struct RealmFacts {
   pid_t centre = -1;
   std::array<char, 256> folder{};
 };
 
-/// Starts a process with a realm, and ends it with `signal` in the middle of its work.
+/// Starts a process with a realm, and ends it with `signal` during its work.
 RealmFacts EndProcessWithRealm(int signal) {
   std::array<int, 2> pipe{};
   EXPECT_EQ(::pipe(pipe.data()), 0);
@@ -50,8 +50,8 @@ RealmFacts EndProcessWithRealm(int signal) {
     RealmFacts facts;
     facts.centre = realm.GetCentre();
     realm.GetFolder().string().copy(facts.folder.data(), facts.folder.size() - 1);
-    const bool isTold = write(pipe[1], &facts, sizeof facts) == sizeof facts;
-    while (isTold) {
+    const bool isReported = write(pipe[1], &facts, sizeof facts) == sizeof facts;
+    while (isReported) {
       pause();
     }
     _exit(1);
@@ -63,11 +63,11 @@ RealmFacts EndProcessWithRealm(int signal) {
   EXPECT_EQ(kill(facts.centre, 0), 0);
   kill(child, signal);
   EXPECT_EQ(waitpid(child, nullptr, 0), child);
-  std::filesystem::remove_all(facts.folder.data()); // the one thing that a process cannot do once it is dead
+  std::filesystem::remove_all(facts.folder.data()); // the killed process could not do this
   return facts;
 }
 
-TEST(KerberosRealm, EndsItsCentreWithATestThatIsKilled) {
+TEST(KerberosRealm, EndsItsCentreWhenTheTestIsKilled) {
   ASSERT_EQ(prctl(PR_SET_CHILD_SUBREAPER, 1), 0); // so that the orphan's end can be waited for here
   for (const int signal : {SIGKILL, SIGABRT, SIGTERM}) {
     const RealmFacts facts = EndProcessWithRealm(signal);

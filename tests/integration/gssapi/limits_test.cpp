@@ -1,5 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
-// The handler's limits, with a clock that the test turns.
+// The handler's limits, with a clock that the test sets.
 
 #include "integration/gssapi/negotiation_fixture.h"
 #include "spnego_handler_impl.h"
@@ -28,7 +28,7 @@ TEST(HandlerLimits, AreTenLegsAndAMinuteByDefault) {
   EXPECT_EQ(settings.timeLimitSec, 60);
 }
 
-TEST(HandlerLimits, EndANegotiationThatTakesTooManyLegs) {
+TEST(HandlerLimits, EndANegotiationWithTooManyLegs) {
   const RealmWithAlice world;
   world.LogIn();
   GssAcceptor service = world.MakeAcceptor();
@@ -43,7 +43,7 @@ TEST(HandlerLimits, EndANegotiationThatTakesTooManyLegs) {
   EXPECT_FALSE(handler->IsMutuallyAuthenticated());
 }
 
-TEST(HandlerLimits, LetANegotiationEndWithTheLastLeg) {
+TEST(HandlerLimits, AllowANegotiationThatEndsWithTheLastLeg) {
   const RealmWithAlice world;
   world.LogIn();
   GssAcceptor service = world.MakeAcceptor();
@@ -55,7 +55,7 @@ TEST(HandlerLimits, LetANegotiationEndWithTheLastLeg) {
   EXPECT_TRUE(handler->IsMutuallyAuthenticated());
 }
 
-TEST(HandlerLimits, EndAServiceThatNeverIssuesTheToken) {
+TEST(HandlerLimits, EndANegotiationWithAServiceThatNeverIssuesTheToken) {
   const RealmWithAlice world;
   world.LogIn();
   GssAcceptor service = world.MakeAcceptor();
@@ -71,9 +71,9 @@ TEST(HandlerLimits, EndAServiceThatNeverIssuesTheToken) {
 /// A handler with a limit of five seconds, and its clock.
 struct TimedNegotiation {
   std::chrono::steady_clock::time_point now{};
-  seconds perLook{0}; ///< how much time goes by with each look at the clock
+  seconds perReading{0}; ///< how far the clock advances each time it is read
   const std::shared_ptr<SpnegoHandlerImpl> handler = std::make_shared<SpnegoHandlerImpl>(FiveSeconds(), [this] {
-    now += perLook;
+    now += perReading;
     return now;
   });
 
@@ -84,7 +84,7 @@ struct TimedNegotiation {
   }
 };
 
-TEST(HandlerLimits, EndANegotiationWhoseServiceTakesTooLong) {
+TEST(HandlerLimits, EndANegotiationThatTakesTooLong) {
   const RealmWithAlice world;
   world.LogIn();
   GssAcceptor service = world.MakeAcceptor();
@@ -96,19 +96,19 @@ TEST(HandlerLimits, EndANegotiationWhoseServiceTakesTooLong) {
   EXPECT_FALSE(timed.handler->IsMutuallyAuthenticated());
 }
 
-TEST(HandlerLimits, LetANegotiationTakeAllItsTime) {
+TEST(HandlerLimits, AllowANegotiationThatTakesAllItsTime) {
   const RealmWithAlice world;
   world.LogIn();
   GssAcceptor service = world.MakeAcceptor();
   TimedNegotiation timed;
-  timed.now += seconds(1000); // before the first leg no time counts
+  timed.now += seconds(1000); // time before the first leg does not count
   const Bytes finalLeg = service.Accept(*timed.handler->NegotiateLeg({}));
   timed.now += seconds(5);
   EXPECT_NO_THROW(timed.handler->NegotiateLeg(finalLeg));
   EXPECT_TRUE(timed.handler->IsMutuallyAuthenticated());
 }
 
-TEST(HandlerLimits, MayBeSoLongAsToBeNone) {
+TEST(HandlerLimits, MayBeTheLargestNumber) {
   const RealmWithAlice world;
   world.LogIn();
   GssAcceptor service = world.MakeAcceptor();
@@ -117,11 +117,11 @@ TEST(HandlerLimits, MayBeSoLongAsToBeNone) {
   EXPECT_EQ(Testing::Negotiate(*CreateSpnegoHandler(settings), service), 2);
 }
 
-TEST(HandlerLimits, CountTheTimeThatTheRealmTakes) {
+TEST(HandlerLimits, IncludeTheTimeThatTheRealmTakes) {
   const RealmWithAlice world;
   world.LogIn();
   TimedNegotiation timed;
-  timed.perLook = seconds(3); // the leg's beginning, a look before it, and one after it
+  timed.perReading = seconds(3); // the clock is read when the leg begins, before the realm's answer and after it
   EXPECT_THROWS_MESSAGE(timed.handler->NegotiateLeg({}), GssLimitException,
                         "The negotiation with sts@localhost reached its time limit: 5 s");
 }

@@ -1,5 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
-// What the GSSAPI could answer, and Kerberos does not: the linker leads the handler's calls past this file.
+// Answers that the GSSAPI allows and Kerberos never gives: the linker redirects the handler's calls to this file.
 
 #include "integration/gssapi/negotiation_fixture.h"
 #include "support/throws_message.h"
@@ -11,7 +11,7 @@
 namespace {
 
 bool g_forgetsMutualAuthentication = false;
-bool g_takesNoNames = false;
+bool g_acceptsNoNames = false;
 
 } // namespace
 
@@ -21,8 +21,8 @@ bool g_takesNoNames = false;
       gss_OID *actualMechanism, gss_buffer_t output, OM_uint32 *flags, OM_uint32 *actualSeconds
 
 extern "C" OM_uint32 RealInitContext(ARGUMENTS) asm("__real_gss_init_sec_context");
-extern "C" OM_uint32 BentInitContext(ARGUMENTS) asm("__wrap_gss_init_sec_context");
-extern "C" OM_uint32 BentInitContext(ARGUMENTS) {
+extern "C" OM_uint32 AlteredInitContext(ARGUMENTS) asm("__wrap_gss_init_sec_context");
+extern "C" OM_uint32 AlteredInitContext(ARGUMENTS) {
   const OM_uint32 major = RealInitContext(minor, credential, context, target, mechanism, wanted, seconds, bindings,
                                           input, actualMechanism, output, flags, actualSeconds);
   if (g_forgetsMutualAuthentication) {
@@ -33,10 +33,10 @@ extern "C" OM_uint32 BentInitContext(ARGUMENTS) {
 
 extern "C" OM_uint32 RealImportName(OM_uint32 *minor, gss_buffer_t text, gss_OID form,
                                     gss_name_t *name) asm("__real_gss_import_name");
-extern "C" OM_uint32 BentImportName(OM_uint32 *minor, gss_buffer_t text, gss_OID form,
-                                    gss_name_t *name) asm("__wrap_gss_import_name");
-extern "C" OM_uint32 BentImportName(OM_uint32 *minor, gss_buffer_t text, gss_OID form, gss_name_t *name) {
-  if (g_takesNoNames) {
+extern "C" OM_uint32 AlteredImportName(OM_uint32 *minor, gss_buffer_t text, gss_OID form,
+                                       gss_name_t *name) asm("__wrap_gss_import_name");
+extern "C" OM_uint32 AlteredImportName(OM_uint32 *minor, gss_buffer_t text, gss_OID form, gss_name_t *name) {
+  if (g_acceptsNoNames) {
     *minor = 0;
     return GSS_S_BAD_NAME;
   }
@@ -46,14 +46,14 @@ extern "C" OM_uint32 BentImportName(OM_uint32 *minor, gss_buffer_t text, gss_OID
 namespace SsoClient::Gssapi {
 namespace {
 
-TEST(Mechanism, ThatTakesNotTheNameMakesItABadArgument) {
-  g_takesNoNames = true;
+TEST(Mechanism, MakesANameThatItRefusesAnInvalidArgument) {
+  g_acceptsNoNames = true;
   EXPECT_THROWS_MESSAGE(CreateSpnegoHandler(Testing::SettingsFor()), Tarvel::InvalidArgumentException,
                         "Invalid argument : 'sts@localhost' is not a valid name: An invalid name was supplied");
-  g_takesNoNames = false;
+  g_acceptsNoNames = false;
 }
 
-TEST(Mechanism, ThatDoesWithoutMutualAuthenticationIsNotGoodEnough) {
+TEST(Mechanism, IsRefusedWithoutMutualAuthentication) {
   const Testing::RealmWithAlice world;
   world.LogIn();
   Testing::GssAcceptor service = world.MakeAcceptor();

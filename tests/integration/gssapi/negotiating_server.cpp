@@ -10,7 +10,7 @@ namespace Testing {
 
 namespace {
 
-/// What stands between two texts; empty when they do not.
+/// The text between `before` and `after`; empty when `before` does not occur.
 std::string Between(const std::string &text, const std::string &before, const std::string &after) {
   const std::size_t start = text.find(before);
   if (start == std::string::npos) {

@@ -1,7 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// `NegotiatingServer`, a token service on loopback over plain HTTP that negotiates for real, and whose answers the test
-/// bends.
+/// `NegotiatingServer`, a token service on loopback over plain HTTP. It really negotiates; the test writes its answers.
 
 #pragma once
 
@@ -24,25 +23,25 @@ struct NegotiationAnswer {
   std::string body;
 };
 
-/// What has come of a leg.
+/// A leg of the client, and what the GSSAPI answers to it.
 struct NegotiationLeg {
   int number = 1;      ///< counted from 1
   std::string request; ///< header and body
-  std::string context; ///< as the client names it
+  std::string context; ///< the identifier that the client sent
   std::string answer;  ///< the GSSAPI's leg in Base64
   bool isLast = false; ///< whether the negotiation is complete
 };
 
 class NegotiatingServer {
 public:
-  /// Called for one leg after the other, on a thread of the server's.
+  /// Called for one leg after the other, on a thread of the server.
   using Script = std::function<NegotiationAnswer(const NegotiationLeg &)>;
 
   NegotiatingServer(const std::string &keytab, const std::filesystem::path &folder, Script script);
 
   SsoClient::SecurityTokenServiceConfig MakeConfig() const;
 
-  /// The contexts that the client named, leg by leg.
+  /// The context identifiers that the client sent, leg by leg.
   std::vector<std::string> GetContexts() const;
 
 private:
@@ -50,10 +49,10 @@ private:
   NegotiationAnswer Answer(const std::string &request);
 
   const Script m_script;
-  mutable std::mutex m_mutex; // guards the rest
+  mutable std::mutex m_mutex; // guards all members below except the server
   GssAcceptor m_acceptor;
   std::vector<std::string> m_contexts;
-  ScriptedServer m_server; // last: its scripts use the rest
+  ScriptedServer m_server; // last: its scripts use all other members
 };
 
 } // namespace Testing

@@ -1,5 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
-// Negotiations that fail: in the realm, at the service, or by what the service answers.
+// Negotiations that fail in the realm, at the service, or by the service's answer.
 
 #include "integration/gssapi/negotiation_fixture.h"
 #include "support/throws_message.h"
@@ -21,7 +21,7 @@ void MakeFirstLeg(const SpnegoSettings &settings) {
   CreateSpnegoHandler(settings)->NegotiateLeg({});
 }
 
-TEST(Negotiation, FailsForAServiceThatTheRealmDoesNotKnow) {
+TEST(Negotiation, FailsForAnUnknownService) {
   const RealmWithAlice world;
   world.LogIn();
   EXPECT_FAILS_WITH_WORDS(MakeFirstLeg(SettingsFor("nobody@localhost")), GssNegotiationException,
@@ -29,7 +29,7 @@ TEST(Negotiation, FailsForAServiceThatTheRealmDoesNotKnow) {
                           "Server nobody/localhost@EXAMPLE.TEST not found in Kerberos database");
 }
 
-TEST(Negotiation, FailsForAServiceOfARealmThatOursDoesNotTrust) {
+TEST(Negotiation, FailsForAServiceOfAnUntrustedRealm) {
   const RealmWithAlice world;
   world.LogIn();
   EXPECT_FAILS_WITH_WORDS(MakeFirstLeg(SettingsFor("sts/localhost@OTHER.TEST")), GssNegotiationException,
@@ -53,11 +53,11 @@ TEST(Negotiation, FailsWhenTheRealmDoesNotAnswer) {
       "The negotiation with sts@localhost failed: ", "Cannot contact any KDC for realm 'EXAMPLE.TEST'");
 }
 
-/// The realm's clock, which the client adopts, differs from the machine's, by which the service goes.
+/// The realm's clock, which the client adopts, differs from the machine's clock, which the service uses.
 struct WrongClock {
   std::string name;
   int offsetSec;
-  std::string words; ///< the service's, and what the client hears of them
+  std::string words; ///< the service's words, and those that reach the client
 };
 
 void PrintTo(const WrongClock &clock, std::ostream *out) {
@@ -70,7 +70,7 @@ std::string NameOfClock(const testing::TestParamInfo<WrongClock> &info) {
 
 class NegotiationWithAWrongClock : public testing::TestWithParam<WrongClock> {};
 
-TEST_P(NegotiationWithAWrongClock, FailsAtTheServiceAndTellsWhy) {
+TEST_P(NegotiationWithAWrongClock, FailsAtTheServiceWithAReason) {
   const RealmWithAlice world({.clockOffsetSec = GetParam().offsetSec, .adoptsClock = true});
   world.LogIn();
   GssAcceptor service = world.MakeAcceptor();
@@ -82,11 +82,11 @@ TEST_P(NegotiationWithAWrongClock, FailsAtTheServiceAndTellsWhy) {
 }
 
 INSTANTIATE_TEST_SUITE_P(Realm, NegotiationWithAWrongClock,
-                         testing::Values(WrongClock{"Ahead", 3600, "Ticket not yet valid"},
-                                         WrongClock{"Behind", -1000, "Clock skew too great"}),
+                         testing::Values(WrongClock{"Early", 3600, "Ticket not yet valid"},
+                                         WrongClock{"Late", -1000, "Clock skew too great"}),
                          NameOfClock);
 
-TEST(Negotiation, FailsWhenTheServiceHasNotTheKeyOfTheOneThatWasNamed) {
+TEST(Negotiation, FailsWhenTheServiceDoesNotHaveTheKeyOfTheRequestedOne) {
   const RealmWithAlice world;
   world.LogIn();
   GssAcceptor service(world.realm.AddPrincipal("impostor/localhost"), world.realm.GetFolder());
@@ -111,22 +111,22 @@ TEST(Negotiation, FailsWithTheFinalLegOfAnotherNegotiation) {
                         "The service sts@localhost was not authenticated: the negotiation is not complete");
 }
 
-struct BadLeg {
+struct InvalidLeg {
   std::string name;
   Bytes leg;
 };
 
-void PrintTo(const BadLeg &leg, std::ostream *out) {
+void PrintTo(const InvalidLeg &leg, std::ostream *out) {
   *out << leg.name;
 }
 
-std::string NameOf(const testing::TestParamInfo<BadLeg> &info) {
+std::string NameOf(const testing::TestParamInfo<InvalidLeg> &info) {
   return info.param.name;
 }
 
-class NegotiationWithABadLeg : public testing::TestWithParam<BadLeg> {};
+class NegotiationWithAnInvalidLeg : public testing::TestWithParam<InvalidLeg> {};
 
-TEST_P(NegotiationWithABadLeg, FailsForGood) {
+TEST_P(NegotiationWithAnInvalidLeg, FailsForGood) {
   const RealmWithAlice world;
   world.LogIn();
   const auto handler = CreateSpnegoHandler(SettingsFor());
@@ -139,19 +139,19 @@ TEST_P(NegotiationWithABadLeg, FailsForGood) {
 }
 
 INSTANTIATE_TEST_SUITE_P(
-    Service, NegotiationWithABadLeg,
-    testing::Values(BadLeg{"OneNull", {0}}, BadLeg{"Text", {'h', 'e', 'l', 'l', 'o'}}, BadLeg{"Nulls", Bytes(4096, 0)},
-                    BadLeg{"Ones", Bytes(4096, 0xff)},
-                    // RFC 4178, NegTokenResp: negState alone
-                    BadLeg{"AcceptedWithoutAProof", {0xa1, 0x07, 0x30, 0x05, 0xa0, 0x03, 0x0a, 0x01, 0x00}},
-                    BadLeg{"IncompleteWithoutALeg", {0xa1, 0x07, 0x30, 0x05, 0xa0, 0x03, 0x0a, 0x01, 0x01}},
-                    BadLeg{"Rejected", {0xa1, 0x07, 0x30, 0x05, 0xa0, 0x03, 0x0a, 0x01, 0x02}},
-                    BadLeg{"UnknownState", {0xa1, 0x07, 0x30, 0x05, 0xa0, 0x03, 0x0a, 0x01, 0x63}},
-                    BadLeg{"LengthBeyondItsEnd", {0xa1, 0x84, 0xff, 0xff, 0xff, 0xff, 0x30, 0x05, 0xa0, 0x03}},
-                    // a NegTokenInit, which is the client's to send
-                    BadLeg{"InitialToken",
-                           {0x60, 0x0e, 0x06, 0x06, 0x2b, 0x06, 0x01, 0x05, 0x05, 0x02, 0xa0, 0x04, 0x30, 0x02, 0xa0,
-                            0x00}}),
+    Service, NegotiationWithAnInvalidLeg,
+    testing::Values(InvalidLeg{"OneNull", {0}}, InvalidLeg{"Text", {'h', 'e', 'l', 'l', 'o'}},
+                    InvalidLeg{"Nulls", Bytes(4096, 0)}, InvalidLeg{"Ones", Bytes(4096, 0xff)},
+                    // RFC 4178, NegTokenResp: only negState
+                    InvalidLeg{"AcceptedWithoutAProof", {0xa1, 0x07, 0x30, 0x05, 0xa0, 0x03, 0x0a, 0x01, 0x00}},
+                    InvalidLeg{"IncompleteWithoutALeg", {0xa1, 0x07, 0x30, 0x05, 0xa0, 0x03, 0x0a, 0x01, 0x01}},
+                    InvalidLeg{"Rejected", {0xa1, 0x07, 0x30, 0x05, 0xa0, 0x03, 0x0a, 0x01, 0x02}},
+                    InvalidLeg{"UnknownState", {0xa1, 0x07, 0x30, 0x05, 0xa0, 0x03, 0x0a, 0x01, 0x63}},
+                    InvalidLeg{"LengthBeyondItsEnd", {0xa1, 0x84, 0xff, 0xff, 0xff, 0xff, 0x30, 0x05, 0xa0, 0x03}},
+                    // a NegTokenInit, which only the client may send
+                    InvalidLeg{"InitialToken",
+                               {0x60, 0x0e, 0x06, 0x06, 0x2b, 0x06, 0x01, 0x05, 0x05, 0x02, 0xa0, 0x04, 0x30, 0x02,
+                                0xa0, 0x00}}),
     NameOf);
 
 TEST(Negotiation, FailsWithEachPrefixOfAFinalLeg) {
@@ -172,7 +172,7 @@ TEST(Negotiation, FailsWithEachPrefixOfAFinalLeg) {
 TEST(Negotiation, FailsWithEachChangeOfTheProofInAFinalLeg) {
   const RealmWithAlice world;
   world.LogIn();
-  constexpr std::size_t ENCRYPTED = 50; // at least so many bytes at the end are
+  constexpr std::size_t ENCRYPTED = 50; // at least this many bytes at the end are encrypted
   for (std::size_t back = 1; back <= ENCRYPTED; ++back) {
     GssAcceptor service = world.MakeAcceptor();
     const auto handler = CreateSpnegoHandler(SettingsFor());
@@ -184,7 +184,7 @@ TEST(Negotiation, FailsWithEachChangeOfTheProofInAFinalLeg) {
   }
 }
 
-TEST(Negotiation, FailsWhenTheServiceSendsNoLegTooEarly) {
+TEST(Negotiation, FailsWhenTheServiceSendsNoLegBeforeTheEnd) {
   const RealmWithAlice world;
   world.LogIn();
   const auto handler = CreateSpnegoHandler(SettingsFor());
@@ -193,7 +193,7 @@ TEST(Negotiation, FailsWhenTheServiceSendsNoLegTooEarly) {
                         "The service sts@localhost sent no leg, but the negotiation is not complete");
 }
 
-TEST(Negotiation, FailsWhenTheServiceGoesOnAfterTheEnd) {
+TEST(Negotiation, FailsWhenTheServiceSendsALegAfterTheEnd) {
   const RealmWithAlice world;
   world.LogIn();
   GssAcceptor service = world.MakeAcceptor();
@@ -205,7 +205,7 @@ TEST(Negotiation, FailsWhenTheServiceGoesOnAfterTheEnd) {
   EXPECT_FALSE(handler->IsMutuallyAuthenticated());
 }
 
-TEST(Negotiation, BeginsWithTheClientsLeg) {
+TEST(Negotiation, RefusesALegOfTheServiceAtTheBeginning) {
   const auto handler = CreateSpnegoHandler(SettingsFor());
   EXPECT_THROWS_MESSAGE(handler->NegotiateLeg({1, 2, 3}), Tarvel::InvalidArgumentException,
                         "Invalid argument : The first leg is the client's");

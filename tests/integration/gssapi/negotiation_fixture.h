@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// What most tests of the negotiation start from: a realm with a service and a user.
+/// The starting point of most tests of the negotiation: a realm with a service and a user.
 
 #pragma once
 
@@ -26,7 +26,7 @@ using Bytes = std::vector<std::uint8_t>;
 struct RealmWithAlice {
   explicit RealmWithAlice(const RealmSettings &settings = {}) : realm(settings) {}
 
-  /// Logs alice in: her ticket is in the default cache.
+  /// Logs alice in: puts her ticket into the default cache.
   void LogIn() const { realm.GetTicket("alice", userKeytab, realm.GetDefaultCache()); }
 
   GssAcceptor MakeAcceptor() const { return GssAcceptor(serviceKeytab, realm.GetFolder()); }
@@ -42,8 +42,8 @@ inline SsoClient::Gssapi::SpnegoSettings SettingsFor(const std::string &service 
   return settings;
 }
 
-/// Drives both sides to their end.
-/// @return how many legs the client has made
+/// Runs both sides of a negotiation to its end.
+/// @return the number of the client's legs
 inline int Negotiate(SsoClient::NegotiationHandler &client, GssAcceptor &service) {
   Bytes leg = *client.NegotiateLeg({});
   int legs = 1;
@@ -58,8 +58,8 @@ inline int Negotiate(SsoClient::NegotiationHandler &client, GssAcceptor &service
   return legs;
 }
 
-/// Judges an exception whose message begins with our text and goes on with the words of the Kerberos library, whose
-/// versions differ in what they add to the words that are expected here.
+/// Checks for an exception whose message begins with `ours` and continues with text of the Kerberos library. That text
+/// contains `words`; what comes before and after them differs between versions.
 template <typename Expected, typename Statement>
 ::testing::AssertionResult FailsWithWords(const Statement &statement, const std::string &ours,
                                           const std::string &words) {
@@ -81,6 +81,6 @@ template <typename Expected, typename Statement>
 
 } // namespace Testing
 
-/// Expects exactly the class `Class`, a message that begins with `ours` and has `words` behind that.
+/// Expects an exception of exactly the class `Class`, whose message begins with `ours` and contains `words` after that.
 #define EXPECT_FAILS_WITH_WORDS(statement, Class, ours, words)                                                         \
   EXPECT_TRUE(::Testing::FailsWithWords<Class>([&] { statement; }, ours, words))

@@ -1,5 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
-// How the development service keeps negotiations that have not ended.
+// The development service's store of negotiations that have not ended.
 
 #include "negotiations.h"
 #include "refusal.h"
@@ -20,7 +20,7 @@ const Leg GO_ON = {'g'};
 const Leg END = {'e'};
 const Leg BAD = {'b'};
 
-/// Goes by what the leg says.
+/// Behaves as the leg says.
 class ScriptedAcceptance final : public Acceptance {
 public:
   AcceptedLeg Accept(const Leg &leg) override {
@@ -47,7 +47,7 @@ protected:
   Negotiations m_negotiations{std::make_unique<const ScriptedAcceptor>(), [this] { return m_now; }};
 };
 
-TEST_F(OpenNegotiations, RememberWhatTheFirstLegAskedForUntilTheLast) {
+TEST_F(OpenNegotiations, KeepTheRequestOfTheFirstLegUntilTheLast) {
   NegotiatedRequest request;
   request.lifetime = std::chrono::hours(1);
   request.facts.audience = {"https://a.example/"};
@@ -59,25 +59,25 @@ TEST_F(OpenNegotiations, RememberWhatTheFirstLegAskedForUntilTheLast) {
   EXPECT_EQ(last.request.facts.audience, request.facts.audience);
 }
 
-TEST_F(OpenNegotiations, RefuseALegOfNone) {
+TEST_F(OpenNegotiations, RefuseALegOfAnUnknownContext) {
   EXPECT_THROWS_MESSAGE(m_negotiations.Continue("c", GO_ON), Refusal,
                         "no negotiation with that context is waiting for a leg");
 }
 
-TEST_F(OpenNegotiations, RefuseALegOfOneThatHasEnded) {
+TEST_F(OpenNegotiations, RefuseALegOfANegotiationThatHasEnded) {
   m_negotiations.Begin("c", END, {});
   EXPECT_THROWS_MESSAGE(m_negotiations.Continue("c", GO_ON), Refusal,
                         "no negotiation with that context is waiting for a leg");
 }
 
-TEST_F(OpenNegotiations, ForgetOneWhoseLegIsRefused) {
+TEST_F(OpenNegotiations, ForgetANegotiationAfterARefusedLeg) {
   m_negotiations.Begin("c", GO_ON, {});
   EXPECT_THROWS_MESSAGE(m_negotiations.Continue("c", BAD), Refusal, "bad leg");
   EXPECT_THROWS_MESSAGE(m_negotiations.Continue("c", GO_ON), Refusal,
                         "no negotiation with that context is waiting for a leg");
 }
 
-TEST_F(OpenNegotiations, ForgetOneAfterAMinute) {
+TEST_F(OpenNegotiations, ForgetANegotiationAfterAMinute) {
   m_negotiations.Begin("c", GO_ON, {});
   m_now += seconds(60);
   EXPECT_NO_THROW(m_negotiations.Continue("c", GO_ON));
@@ -86,14 +86,14 @@ TEST_F(OpenNegotiations, ForgetOneAfterAMinute) {
                         "no negotiation with that context is waiting for a leg");
 }
 
-TEST_F(OpenNegotiations, RefuseAContextThatIsTaken) {
+TEST_F(OpenNegotiations, RefuseAContextThatIsInUse) {
   m_negotiations.Begin("c", GO_ON, {});
   EXPECT_THROWS_MESSAGE(m_negotiations.Begin("c", GO_ON, {}), Refusal,
                         "a negotiation with that context has already begun");
   EXPECT_NO_THROW(m_negotiations.Continue("c", GO_ON));
 }
 
-TEST_F(OpenNegotiations, AreAHundredAtMost) {
+TEST_F(OpenNegotiations, AreAtMostAHundred) {
   for (int i = 0; i < 100; ++i) {
     m_negotiations.Begin(std::to_string(i), GO_ON, {});
   }
@@ -102,7 +102,7 @@ TEST_F(OpenNegotiations, AreAHundredAtMost) {
   EXPECT_NO_THROW(m_negotiations.Begin("c", GO_ON, {}));
 }
 
-/// In the middle of a leg, the same negotiation is asked for again.
+/// Continues the same negotiation again while a leg is being accepted.
 class NestedAcceptor final : public GssAcceptor {
 public:
   std::unique_ptr<Acceptance> Begin() const override { return std::make_unique<Nested>(*this); }
@@ -124,11 +124,11 @@ private:
   };
 };
 
-TEST(OpenNegotiation, TakesOneLegAtATime) {
+TEST(OpenNegotiation, AcceptsOneLegAtATime) {
   auto acceptor = std::make_unique<NestedAcceptor>();
-  NestedAcceptor &seen = *acceptor;
+  NestedAcceptor &nested = *acceptor;
   Negotiations negotiations(std::move(acceptor));
-  seen.negotiations = &negotiations;
+  nested.negotiations = &negotiations;
   negotiations.Begin("c", GO_ON, {});
   EXPECT_THROWS_MESSAGE(negotiations.Continue("c", END), Refusal, "a leg of that negotiation is being accepted");
 }

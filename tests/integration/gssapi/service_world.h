@@ -1,6 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// What tests of a whole acquisition start from: a realm, the development service with its key, and alice.
+/// The starting point of tests of a whole acquisition: a realm, the development service with its key, and the user
+/// alice.
 
 #pragma once
 
@@ -21,14 +22,14 @@ namespace Testing {
 /// alice's ticket in the default cache.
 class ServiceWorld {
 public:
-  /// @param arguments of the service, which come behind its keytab
+  /// @param arguments of the service, which come after its keytab
   explicit ServiceWorld(const RealmSettings &settings = {.name = "CORP.EXAMPLE"},
                         const std::vector<std::string> &arguments = {});
 
   const KerberosRealm &GetRealm() const noexcept { return m_realm; }
   const DevSts &GetService() const noexcept { return m_service; }
 
-  /// How to reach the service, or the address under which one fault is met.
+  /// The configuration for the service, or for its address at which it makes the fault `fault`.
   /// @param identity "client" for holder-of-key tokens; empty for none
   SsoClient::SecurityTokenServiceConfig MakeConfig(const std::string &fault = "",
                                                    const std::string &identity = "") const;
@@ -40,13 +41,13 @@ private:
   const Tarvel::Ref<Tarvel::Ssl::SSLContext> m_tls;
 };
 
-/// A spec for an hour.
+/// A spec with a lifetime of one hour.
 SsoClient::TokenSpec HourSpec();
 
-/// "alice@corp.example".
+/// For example "alice@corp.example".
 std::string SubjectOf(const SsoClient::SamlToken &token);
 
-/// Drives the negotiation leg by leg, to mutual authentication.
+/// Negotiates leg by leg, until mutual authentication.
 /// @param legs set to the number of messages that were sent
 std::shared_ptr<const SsoClient::SamlToken> NegotiateByHand(SsoClient::InternalApi::GssNegotiationContext &context,
                                                             SsoClient::Gssapi::SpnegoHandler &handler, int &legs);

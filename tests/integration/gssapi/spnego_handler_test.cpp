@@ -1,5 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
-// The handler against the GSSAPI's own acceptor: with which credentials, for whom, and in how many legs.
+// The handler against the GSSAPI's own acceptor: which credentials it uses, for which client, and in how many legs.
 
 #include "integration/gssapi/negotiation_fixture.h"
 #include "memory_cache.h"
@@ -41,7 +41,7 @@ TEST(SpnegoHandler, CompletesMutualAuthenticationWithTheServicesFinalLeg) {
   EXPECT_NO_THROW(handler->RequireMutualAuthentication());
 }
 
-TEST(SpnegoHandler, DemandsMutualAuthenticationOfAServiceThatSendsNoFinalLeg) {
+TEST(SpnegoHandler, RequiresMutualAuthenticationOfAServiceThatSendsNoFinalLeg) {
   const RealmWithAlice world;
   world.LogIn();
   const auto handler = CreateSpnegoHandler(SettingsFor());
@@ -50,7 +50,7 @@ TEST(SpnegoHandler, DemandsMutualAuthenticationOfAServiceThatSendsNoFinalLeg) {
                         "The service sts@localhost was not authenticated: the negotiation is not complete");
 }
 
-TEST(SpnegoHandler, TakesAKerberosPrincipalForTheService) {
+TEST(SpnegoHandler, AcceptsAKerberosPrincipalAsTheService) {
   const RealmWithAlice world;
   world.LogIn();
   GssAcceptor service = world.MakeAcceptor();
@@ -88,7 +88,7 @@ TEST(SpnegoHandler, NeverDelegatesCredentials) {
   EXPECT_FALSE(service.HasDelegatedCredential());
 }
 
-TEST(SpnegoHandler, UsesTheNamedCacheAndNotTheDefaultOne) {
+TEST(SpnegoHandler, UsesTheConfiguredCacheAndNotTheDefaultOne) {
   const RealmWithAlice world;
   world.LogIn();
   const std::string cache = world.realm.NameFile("bob_cache");
@@ -134,7 +134,7 @@ TEST(SpnegoHandler, LeavesTheEnvironmentAlone) {
   EXPECT_EQ(readEnvironment(), before);
 }
 
-TEST(SpnegoHandler, KeepsTheKeytabsTicketInTheCacheThatIsNamed) {
+TEST(SpnegoHandler, KeepsTheKeytabsTicketInTheConfiguredCache) {
   const RealmWithAlice world;
   SpnegoSettings settings = SettingsFor();
   settings.clientKeytab = world.userKeytab;
@@ -149,7 +149,7 @@ TEST(SpnegoHandler, KeepsTheKeytabsTicketInTheCacheThatIsNamed) {
   EXPECT_EQ(second.GetClient(), "alice@EXAMPLE.TEST");
 }
 
-TEST(SpnegoHandler, NegotiatesAsTheClientThatIsNamed) {
+TEST(SpnegoHandler, NegotiatesAsTheConfiguredClient) {
   const RealmWithAlice world;
   SpnegoSettings settings = SettingsFor();
   settings.client = "alice@EXAMPLE.TEST";
@@ -159,7 +159,7 @@ TEST(SpnegoHandler, NegotiatesAsTheClientThatIsNamed) {
   EXPECT_EQ(service.GetClient(), "alice@EXAMPLE.TEST");
 }
 
-TEST(SpnegoHandler, HoldsNothingOfANegotiationThatHasGone) {
+TEST(SpnegoHandler, LeaksNoDescriptor) {
   const RealmWithAlice world;
   world.LogIn();
   SpnegoSettings withKeytab = SettingsFor();
@@ -168,7 +168,7 @@ TEST(SpnegoHandler, HoldsNothingOfANegotiationThatHasGone) {
     GssAcceptor service = world.MakeAcceptor();
     Negotiate(*CreateSpnegoHandler(SettingsFor()), service);
     GssAcceptor other = world.MakeAcceptor();
-    CreateSpnegoHandler(withKeytab)->NegotiateLeg({}); // and is left alone in the middle
+    CreateSpnegoHandler(withKeytab)->NegotiateLeg({}); // this negotiation is not completed
   };
   negotiateOnce();
   const std::size_t before = Testing::CountDescriptors();
@@ -178,7 +178,7 @@ TEST(SpnegoHandler, HoldsNothingOfANegotiationThatHasGone) {
   EXPECT_EQ(Testing::CountDescriptors(), before);
 }
 
-TEST(MemoryCache, HasANameOfItsOwnAndGoesWithItsObject) {
+TEST(MemoryCache, HasAUniqueNameAndEndsWithItsObject) {
   const RealmWithAlice world;
   const auto hasPrincipal = [&](const std::string &cache) {
     SpnegoSettings settings = SettingsFor();

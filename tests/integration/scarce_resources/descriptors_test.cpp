@@ -1,5 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
-// No descriptor left. Each death test is a process of its own, whose first use of the network this is.
+// No descriptor left. Each death test runs in its own process, whose first use of the network it is.
 #include "outcome.h"
 
 #include "support/data_file.h"
@@ -25,7 +25,7 @@
 
 namespace {
 
-/// How the resolver is to fail, and what it leaves in errno.
+/// How the resolver fails, and the errno that it leaves.
 struct ResolverFailure {
   int code;
   int error;
@@ -50,12 +50,12 @@ int Resolve(const char *name, const char *service, const addrinfo *hints, addrin
 namespace Testing {
 namespace {
 
-/// Uses up the process's descriptors but `spare` ones, for as long as it lives.
+/// Uses up the process's descriptors except for `spare` ones, during its lifetime.
 class UsedUpDescriptors {
 public:
   explicit UsedUpDescriptors(int spare) {
     ::getrlimit(RLIMIT_NOFILE, &m_earlier);
-    if (spare == 0) { // with the limit at the standard streams, what another thread closes meanwhile is no use either
+    if (spare == 0) { // with this limit, a descriptor that another thread closes cannot be used again either
       SetLimit(STDERR_FILENO + 1);
       return;
     }
@@ -106,7 +106,7 @@ void Report(const ServicePtr &service) {
   std::_Exit(0);
 }
 
-TEST(NoDescriptorDeathTest, FailsTheFirstUseOfTheNetworkAndNoLaterOne) {
+TEST(NoDescriptorDeathTest, FailsTheFirstUseOfTheNetworkButNoLaterOne) {
   if (IS_SANITIZED) {
     GTEST_SKIP() << "UndefinedBehaviorSanitizer opens descriptors to check the type of an object";
   }
@@ -137,7 +137,7 @@ TEST(NoDescriptorDeathTest, FailsTheFirstUseOfTheNetworkAndNoLaterOne) {
   std::_Exit(0);
 }
 
-TEST(NoDescriptorDeathTest, IsTheReasonThatALaterUseReports) {
+TEST(NoDescriptorDeathTest, IsReportedByALaterUseAsItsReason) {
   if (IS_SANITIZED) {
     GTEST_SKIP() << "UndefinedBehaviorSanitizer opens descriptors to check the type of an object";
   }
@@ -152,7 +152,7 @@ TEST(NoDescriptorDeathTest, IsTheReasonThatALaterUseReports) {
   EXPECT_EXIT(ReportLaterUse(), testing::ExitedWithCode(0), testing::Eq(expected + alice + alice));
 }
 
-/// The reason for which a look-up fails when the resolver does.
+/// The reason that a look-up reports when the resolver fails.
 std::string LookUp(const ResolverFailure &failure) {
   g_resolverFailure = failure;
   std::string reason = "(found)";
@@ -171,12 +171,12 @@ TEST(LookUpName, ReportsTheResolversReason) {
   EXPECT_EQ(LookUp({EAI_SYSTEM, EIO}), "Input/output error");
 }
 
-TEST(LookUpName, ReportsALackOfDescriptorsThatTheResolverMetAndHides) {
+TEST(LookUpName, ReportsALackOfDescriptorsThatIsOnlyInErrno) {
   EXPECT_EQ(LookUp({EAI_NONAME, EMFILE}), "Too many open files");
   EXPECT_EQ(LookUp({EAI_AGAIN, ENFILE}), "Too many open files in system");
 }
 
-TEST(LookUpName, ReportsALackOfDescriptorsThatTheResolverLeavesNoTraceOf) {
+TEST(LookUpName, ReportsALackOfDescriptorsThatIsNotEvenInErrno) {
   const UsedUpDescriptors used(0);
   EXPECT_EQ(LookUp({EAI_NONAME, 0}), "Too many open files");
   EXPECT_EQ(LookUp({EAI_AGAIN, ENOENT}), "Too many open files");

@@ -1,5 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
-// Memory that runs out at each place in turn: a completion is called once all the same, unless the start has thrown.
+// Memory that runs out at each place in turn. A completion is still called once, unless the start has thrown.
 #include "support/completion.h"
 #include "support/process_resources.h"
 #include "support/refused_memory.h"
@@ -33,7 +33,7 @@ std::atomic<int> g_piecesLeft{0};
 std::atomic<int> g_refused{0};
 thread_local bool isInStart = false;
 
-/// Whether the calling thread is one of the platform's, or in a call of the test that starts an operation.
+/// Whether the calling thread is one of the platform's threads, or is in a test's call that starts an operation.
 bool IsConcerned() noexcept {
   thread_local const bool isOfPlatform = [] {
     std::array<char, 16> name{};
@@ -73,7 +73,7 @@ using Tarvel::System::TcpClientSocket;
 
 constexpr int MAX_PIECES = 1000;
 
-/// The one call of a completion, noted without any memory.
+/// Records the one call of a completion, without allocating memory.
 class Note {
 public:
   auto ForEnd() {
@@ -87,7 +87,7 @@ public:
   bool Wait() const {
     return Eventually([this] { return m_calls > 0; });
   }
-  /// What the completion was called with: "" for no failure.
+  /// The message that the completion got; empty without a failure.
   std::string GetMessage() const { return m_message.data(); }
 
 private:
@@ -102,8 +102,8 @@ private:
   std::atomic<int> m_calls{0};
 };
 
-/// Calls `start` while piece number `pieces` of the memory that is asked for, counted from 0, is refused; the platform's
-/// threads go on in that way. Whether it threw.
+/// Calls `start` while allocation number `pieces`, counted from 0, is refused, there and on the platform's threads. The
+/// shortage lasts until `EndShortage`. Returns whether `start` threw.
 bool StartShortOfMemory(Shortage shortage, int pieces, const std::function<void()> &start) {
   g_piecesLeft = pieces;
   g_refused = 0;
@@ -125,12 +125,12 @@ int EndShortage() {
 }
 
 struct Attempt {
-  std::function<void(TcpClientSocket &)> prepare; ///< with memory
+  std::function<void(TcpClientSocket &)> prepare; ///< called with memory
   std::function<void(TcpClientSocket &, Note &)> start;
-  std::function<void(TcpClientSocket &)> end; ///< without
+  std::function<void(TcpClientSocket &)> end; ///< called without memory
 };
 
-/// Makes the attempt with each piece of memory refused in turn. The messages with which it failed.
+/// Makes the attempt with each allocation refused in turn. Returns the messages of the failures; "" for a success.
 std::set<std::string> FailAtEachPiece(Shortage shortage, const Attempt &attempt) {
   std::set<std::string> messages;
   EXPECT_TRUE(DrainIoThreads());
@@ -150,7 +150,7 @@ std::set<std::string> FailAtEachPiece(Shortage shortage, const Attempt &attempt)
       return messages;
     }
   }
-  ADD_FAILURE() << "there is no end of the memory that is asked for";
+  ADD_FAILURE() << "the attempt makes ever more allocations";
   return messages;
 }
 
@@ -165,7 +165,7 @@ protected:
   void SetUp() override { CreateTcpClientSocket(); } // starts the I/O threads
 };
 
-TEST_P(WithoutMemory, AConnectToAnAddressIsCompletedOnce) {
+TEST_P(WithoutMemory, CompletesAConnectToAnAddressOnce) {
   ScriptedServer server([](ServerConnection &peer) { peer.Stall(); });
   const int port = server.GetPort();
   const std::string host = "127.0.0.1";
@@ -182,7 +182,7 @@ TEST_P(WithoutMemory, AConnectToAnAddressIsCompletedOnce) {
   EXPECT_GE(messages.size(), 3u);
 }
 
-TEST_P(WithoutMemory, AConnectToANameIsCompletedOnce) {
+TEST_P(WithoutMemory, CompletesAConnectToANameOnce) {
   ScriptedServer server([](ServerConnection &peer) { peer.Stall(); });
   const int port = server.GetPort();
   const std::string host = "a-name-that-is-longer-than-a-short-text.example";
@@ -203,7 +203,7 @@ TEST_P(WithoutMemory, AConnectToANameIsCompletedOnce) {
   EXPECT_GE(messages.size(), 3u);
 }
 
-TEST_P(WithoutMemory, AConnectOfAConnectionSpecIsCompletedOnce) {
+TEST_P(WithoutMemory, CompletesAConnectOfAConnectionSpecOnce) {
   ScriptedServer server([](ServerConnection &peer) { peer.Stall(); });
   Ref<Tarvel::Http::ConnectionSpec> plain;
   Ref<Tarvel::Http::ConnectionSpec> withoutContext;
@@ -230,7 +230,7 @@ TEST_P(WithoutMemory, AConnectOfAConnectionSpecIsCompletedOnce) {
   }
 }
 
-TEST_P(WithoutMemory, AConnectThatIsClosedIsCompletedOnce) {
+TEST_P(WithoutMemory, CompletesAConnectThatIsClosedOnce) {
   const FullPort full;
   const std::string host = "127.0.0.1";
   const std::set<std::string> messages =
@@ -253,7 +253,7 @@ void Connect(TcpClientSocket &socket, int port) {
   ASSERT_EQ(connected.GetMessage(), "");
 }
 
-TEST_P(WithoutMemory, AReadIsCompletedOnce) {
+TEST_P(WithoutMemory, CompletesAReadOnce) {
   ScriptedServer server([](ServerConnection &peer) { peer.Stall(); });
   char byte = 0;
   const std::set<std::string> messages = FailAtEachPiece(
@@ -265,8 +265,8 @@ TEST_P(WithoutMemory, AReadIsCompletedOnce) {
   EXPECT_EQ(messages, (std::set<std::string>{"(thrown)", "There is not enough memory", closed}));
 }
 
-TEST_P(WithoutMemory, AWriteInSeveralPartsIsCompletedOnce) {
-  constexpr std::size_t LENGTH = 8u << 20; // more than the system takes at once
+TEST_P(WithoutMemory, CompletesAWriteInSeveralPartsOnce) {
+  constexpr std::size_t LENGTH = 8u << 20; // more than the system accepts at once
   ScriptedServer server([](ServerConnection &peer) { peer.ReadExactly(LENGTH); });
   const std::string message(LENGTH, 'x');
   const std::set<std::string> messages =

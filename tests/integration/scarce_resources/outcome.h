@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// How an operation of the service ends, as text.
+/// The outcome of an operation of the service, as text.
 
 #pragma once
 
@@ -13,13 +13,13 @@ namespace Testing {
 
 using ServicePtr = std::shared_ptr<const SsoClient::SecurityTokenService>;
 
-/// A client of the service at `url`. It has read all its files.
+/// A client of the service at `url`, which has already read all its files.
 ServicePtr ServiceAt(const std::string &url);
 
-/// Acquires a token: its subject, or the class and the message of the exception.
+/// Acquires a token. Returns its subject, or the class and the message of the exception.
 std::string Acquire(const ServicePtr &service);
 
-/// The same by `AcquireTokenAsync`; "thrown " comes before what the start throws.
+/// The same with `AcquireTokenAsync`. For an exception that the start throws, the text begins with "thrown ".
 std::string AcquireAsynchronously(const ServicePtr &service);
 
 } // namespace Testing

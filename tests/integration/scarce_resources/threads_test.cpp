@@ -1,5 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
-// No thread left. Each test is a process of its own, whose first use of the network this is.
+// No thread left. Each test runs in its own process, whose first use of the network it is.
 #include "outcome.h"
 
 #include "support/data_file.h"
@@ -52,7 +52,7 @@ public:
   void AllowThreads(int count) { g_threadsLeft = count; }
   void AllowAllThreads() { g_threadsLeft = 1000000; }
 
-  /// The service by its address, or by its name.
+  /// A client that reaches the service by `host`: its address or its name.
   ServicePtr GetService(const std::string &host = "127.0.0.1") const {
     std::string url = m_server.GetUrl();
     return ServiceAt(url.replace(url.find("localhost"), 9, host));
@@ -66,14 +66,14 @@ private:
   ServiceWorld world;
   world.AllowThreads(0);
   std::cerr << Acquire(world.GetService()) << "\n";
-  world.AllowThreads(1); // the pool's
+  world.AllowThreads(1); // for the pool
   std::cerr << AcquireAsynchronously(world.GetService()) << "\n";
   world.AllowAllThreads();
   std::cerr << Acquire(world.GetService()) << "\n" << AcquireAsynchronously(world.GetService()) << "\n";
   std::_Exit(0);
 }
 
-TEST(NoThreadDeathTest, FailsTheFirstUseOfTheNetworkAndNoLaterOne) {
+TEST(NoThreadDeathTest, FailsTheFirstUseOfTheNetworkButNoLaterOne) {
   testing::FLAGS_gtest_death_test_style = "threadsafe";
   EXPECT_EXIT(ReportWithoutIoThread(), testing::ExitedWithCode(0),
               testing::Eq(std::string(NO_THREAD) + NO_THREAD + ALICE + ALICE));
@@ -88,7 +88,7 @@ TEST(NoThreadDeathTest, FailsTheFirstUseOfTheNetworkAndNoLaterOne) {
   std::_Exit(0);
 }
 
-TEST(NoThreadDeathTest, OfThePoolIsReportedByTheStartOfAnAsynchronousOperation) {
+TEST(NoThreadDeathTest, MakesTheStartOfAnAsynchronousOperationThrow) {
   testing::FLAGS_gtest_death_test_style = "threadsafe";
   EXPECT_EXIT(ReportWithoutPoolThread(), testing::ExitedWithCode(0),
               testing::Eq(std::string("thrown ") + NO_THREAD + ALICE));
@@ -103,7 +103,7 @@ TEST(NoThreadDeathTest, OfThePoolIsReportedByTheStartOfAnAsynchronousOperation) 
   std::_Exit(0);
 }
 
-TEST(NoThreadDeathTest, IsMissedWhenThereIsOneOfTwoForTheNetwork) {
+TEST(NoThreadDeathTest, HasNoEffectWhenOneOfTwoNetworkThreadsRuns) {
   testing::FLAGS_gtest_death_test_style = "threadsafe";
   EXPECT_EXIT(ReportWithOneIoThread(), testing::ExitedWithCode(0), testing::Eq(std::string(ALICE) + ALICE));
 }
@@ -122,7 +122,7 @@ TEST(NoThreadDeathTest, IsMissedWhenThereIsOneOfTwoForTheNetwork) {
   std::_Exit(0);
 }
 
-TEST(NoThreadDeathTest, ForTheResolverFailsTheConnect) {
+TEST(NoThreadDeathTest, FailsTheConnectThatNeedsTheResolver) {
   testing::FLAGS_gtest_death_test_style = "threadsafe";
   const std::string failure = "SsoClient::CommunicationException: Cannot connect to localhost:: "
                               "Cannot start a thread: Resource temporarily unavailable\n";

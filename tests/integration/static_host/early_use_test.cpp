@@ -1,5 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
-// What a static object of the host may do before main.
+// Use of the library by a static object of the host, before main.
 #include "host_programs.h"
 
 #include "support/data_file.h"
@@ -15,7 +15,7 @@ std::string UrlOf(int port) {
   return "http://127.0.0.1:" + std::to_string(port) + "/sts";
 }
 
-TEST(StaticObjectBeforeAllOthers, VerifiesAndAcquiresTokensAsMainDoes) {
+TEST(StaticObjectBeforeAllOthers, VerifiesAndAcquiresTokensLikeMain) {
   const std::vector<std::string> answers(4, IssueResponse(ReadDataFile("tokens/bearer.xml")));
   const PostingServer plain(answers);
   const PostingServer secure(answers, TlsSettings());

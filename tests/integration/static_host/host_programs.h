@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// Running a program that the library is linked into statically.
+/// Runs programs that are statically linked with the library.
 
 #pragma once
 
@@ -8,15 +8,15 @@
 
 namespace Testing {
 
-/// The program that uses the library in a static object before all others.
+/// A program that uses the library in its first static object.
 extern const char *const EARLY_HOST_PROGRAM;
-/// The program whose workers use the library while static objects are being destroyed.
+/// A program whose threads use the library while static objects are being destroyed.
 extern const char *const LATE_HOST_PROGRAM;
-/// The program that ends while a request over TLS is under way.
+/// A program that ends while a request over TLS is under way.
 extern const char *const IN_FLIGHT_HOST_PROGRAM;
 
-/// Runs `program` with `environment` ("NAME=VALUE NAME=VALUE") and the folder of the test data in DATA, to its end. What
-/// it printed, and "ended with N" when N, as the shell has it, is not 0.
+/// Runs `program` to its end, with `environment` ("NAME=VALUE NAME=VALUE") and the folder of the test data in DATA.
+/// Returns its output, followed by "ended with N" when its exit code N, in the shell's form, is not 0.
 std::string RunHost(const char *program, const std::string &environment = {});
 
 } // namespace Testing

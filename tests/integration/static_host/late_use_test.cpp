@@ -1,5 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
-// What the host's workers may do while static objects wait for them.
+// Use of the library by the host's threads while static objects wait for them.
 #include "host_programs.h"
 
 #include "support/completion.h"
@@ -16,7 +16,7 @@
 namespace Testing {
 namespace {
 
-TEST(StaticObjectThatJoinsAWorker, IsDestroyedWhileTheWorkerComputes) {
+TEST(StaticObjectThatJoinsAThread, WaitsForTheThreadsComputation) {
   EXPECT_EQ(RunHost(LATE_HOST_PROGRAM),
             "main ends\n"
             "tokens/bearer.xml: {Name: alice; Domain:corp.example}\n"
@@ -28,8 +28,8 @@ TEST(StaticObjectThatJoinsAWorker, IsDestroyedWhileTheWorkerComputes) {
             "joined\n");
 }
 
-// The request would wait four minutes for its response.
-TEST(StaticObjectThatJoinsAWorker, WaitsForNoResponseOverTls) {
+// Otherwise the request would wait four minutes for its response.
+TEST(StaticObjectThatJoinsAThread, DoesNotWaitForAResponseOverTls) {
   std::promise<void> promise;
   const std::shared_future<void> requested = promise.get_future().share();
   const ScriptedServer stalling(

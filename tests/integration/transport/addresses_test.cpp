@@ -1,5 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
-// How a service is reached: by name and by address, over both versions of IP.
+// Reaching a service by name and by address, over both versions of IP.
 
 #include "integration/transport/service_stand_in.h"
 #include "system/name_lookup.h"
@@ -26,7 +26,7 @@ using Testing::ServerConnection;
 using Testing::TlsSettings;
 
 /// Answers with the Host header of the request.
-void TellHost(ServerConnection &connection) {
+void AnswerWithHost(ServerConnection &connection) {
   if (connection.Handshake()) {
     const std::string request = connection.ReadRequest();
     const std::size_t start = request.find("\r\nHost: ") + 8;
@@ -43,8 +43,8 @@ std::string AskHost(const std::string &authority, bool tls = false) {
 TEST(TransportAddresses, ReachAServiceByNameAndByAddress) {
   for (const bool tls : {false, true}) {
     const auto settings = tls ? std::optional(TlsSettings()) : std::nullopt;
-    ScriptedServer v4(TellHost, settings);
-    ScriptedServer v6(TellHost, settings, true);
+    ScriptedServer v4(AnswerWithHost, settings);
+    ScriptedServer v6(AnswerWithHost, settings, true);
     const std::string port4 = ":" + std::to_string(v4.GetPort());
     const std::string port6 = ":" + std::to_string(v6.GetPort());
     EXPECT_EQ(AskHost("localhost" + port4, tls), "localhost" + port4);
@@ -54,8 +54,8 @@ TEST(TransportAddresses, ReachAServiceByNameAndByAddress) {
   }
 }
 
-TEST(TransportAddresses, TryTheNextOneOfAName) {
-  ScriptedServer server(TellHost);
+TEST(TransportAddresses, AreTriedOneAfterTheOther) {
+  ScriptedServer server(AnswerWithHost);
   const std::string authority = "two.example:" + std::to_string(server.GetPort());
   const ScopedNameLookup lookup([](const std::string &) {
     return AddressList{boost::asio::ip::make_address("::1"), boost::asio::ip::make_address("127.0.0.1")};
@@ -63,7 +63,7 @@ TEST(TransportAddresses, TryTheNextOneOfAName) {
   EXPECT_EQ(AskHost(authority), authority);
 }
 
-TEST(TransportAddresses, AreAllNamedWhenNoneAnswers) {
+TEST(TransportAddresses, AreAllReportedWhenNoneAnswers) {
   const Testing::UnusedPort unused;
   const std::string authority = "two.example:" + std::to_string(unused.GetPort());
   const ScopedNameLookup lookup([](const std::string &) {
@@ -73,7 +73,7 @@ TEST(TransportAddresses, AreAllNamedWhenNoneAnswers) {
             Failure("Cannot connect to " + authority + ": ::1: Connection refused; 127.0.0.1: Connection refused"));
 }
 
-TEST(TransportAddresses, OfAnUnknownHostAreAFailure) {
+TEST(TransportAddresses, CannotBeFoundForAnUnknownHost) {
   const ScopedNameLookup lookup(
       [](const std::string &) -> AddressList { throw NetworkException("Name or service not known"); });
   EXPECT_EQ(AskHost("sts.example"), Failure("Cannot connect to sts.example:80: Name or service not known"));

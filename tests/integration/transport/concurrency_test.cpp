@@ -23,32 +23,32 @@ using Testing::ServiceStandIn;
 
 constexpr int REQUESTS = 500;
 
-/// Counts what has ended, and waits for all.
+/// Counts requests that have ended, and waits for all of them.
 class Tally {
 public:
-  void Note(bool isGood) {
+  void Note(bool hasSucceeded) {
     const std::lock_guard<std::mutex> lock(m_mutex);
-    m_good += isGood ? 1 : 0;
+    m_succeeded += hasSucceeded ? 1 : 0;
     ++m_ended;
     m_changed.notify_all();
   }
-  /// How many were good, when all have ended; -1 when they do not.
+  /// How many have succeeded, when all have ended; -1 when not all end in time.
   int WaitForAll(int count) {
     std::unique_lock<std::mutex> lock(m_mutex);
     const bool ended = m_changed.wait_for(lock, 2 * Testing::PATIENCE, [&] { return m_ended == count; });
-    return ended ? m_good : -1;
+    return ended ? m_succeeded : -1;
   }
 
 private:
   std::mutex m_mutex;
   std::condition_variable m_changed;
-  int m_good = 0;
+  int m_succeeded = 0;
   int m_ended = 0;
 };
 
 class TransportFromAPool : public testing::TestWithParam<std::size_t> {};
 
-TEST_P(TransportFromAPool, CarriesFiveHundredRequestsWhateverTheCeiling) {
+TEST_P(TransportFromAPool, CompletesFiveHundredRequestsWithAnyCeiling) {
   ServiceStandIn service(Testing::AnswerWith(Response("200 OK", "<body/>")));
   Tally tally;
   const auto pool = Tarvel::System::CreateThreadPool(GetParam());
@@ -62,7 +62,7 @@ TEST_P(TransportFromAPool, CarriesFiveHundredRequestsWhateverTheCeiling) {
 INSTANTIATE_TEST_SUITE_P(Ceilings, TransportFromAPool, testing::Values(1, 2, 8, 256),
                          testing::PrintToStringParamName());
 
-TEST(TransportFromALargePool, HasAllRequestsInFlightAtOnceWhereTheCeilingAllows) {
+TEST(TransportFromALargePool, HasAsManyRequestsInFlightAsTheCeilingAllows) {
   constexpr int IN_FLIGHT = 256;
   std::mutex mutex;
   std::condition_variable changed;
@@ -101,7 +101,7 @@ TEST(TransportAsync, HasFiveHundredRequestsInFlightWithoutAThreadForEach) {
   ServiceStandIn service([&](ServerConnection &connection) {
     connection.ReadRequest();
     ++received;
-    Testing::Eventually([&] { return received.load() >= REQUESTS; }); // only then the first is answered
+    Testing::Eventually([&] { return received.load() >= REQUESTS; }); // the first answer waits for the last request
     connection.Write(Response("200 OK", "<body/>"));
   });
   Tally tally;

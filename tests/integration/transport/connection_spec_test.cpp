@@ -62,7 +62,7 @@ TEST(SsoConnectionSpec, HasHostAndEndpointAsGiven) {
   }
 }
 
-TEST(SsoConnectionSpec, IsDescribedByTheAddressOfThePlainOneAndItsEndpoint) {
+TEST(SsoConnectionSpec, IsDescribedByTheAddressOfThePlainSpecAndItsEndpoint) {
   const auto inner = Tarvel::MakeRef<SsoCustomConnectionSpecImpl>("sts.example", 443, false);
   const auto outer = Tarvel::MakeRef<SsoCustomSslConnectionSpecImpl>(nullptr, "", inner);
   const void *const address = inner.get();
@@ -77,13 +77,13 @@ TEST(SsoConnectionSpec, DoesNotSupportReuseAfterAnAuthenticationError) {
   EXPECT_FALSE(Tls("h", 1, nullptr)->IsReuseOnAuthErrorSupported());
 }
 
-TEST(SsoConnectionSpec, TargetsTheConfiguredHostWhereNoDomainControllerIsKnown) {
+TEST(SsoConnectionSpec, TargetsTheConfiguredHostWhenNoDomainControllerIsKnown) {
   EXPECT_EQ(GetOstrelDCName(), "");
   EXPECT_EQ(Tarvel::MakeRef<SsoCustomConnectionSpecImpl>("h", 1, false)->GetConnectionTargetHost(), "h");
   EXPECT_EQ(Tarvel::MakeRef<SsoCustomConnectionSpecImpl>("h", 1, true)->GetConnectionTargetHost(), "h");
 }
 
-TEST(SsoConnectionSpec, ConnectsAndHandsTheStreamOut) {
+TEST(SsoConnectionSpec, ConnectsAndReturnsTheStream) {
   ScriptedServer plain([](ServerConnection &connection) { connection.Stall(); });
   ScriptedServer tls(
       [](ServerConnection &connection) {
@@ -95,15 +95,17 @@ TEST(SsoConnectionSpec, ConnectsAndHandsTheStreamOut) {
     const Connected overTcp = Connect(Plain("localhost", plain.GetPort(), flag));
     EXPECT_EQ(overTcp.failure, "");
     ASSERT_TRUE(overTcp.stream);
+    EXPECT_FALSE(overTcp.stream->IsSecure());
     overTcp.stream->Close();
     const Connected overTls = Connect(Tls("localhost", tls.GetPort(), CreateTrustingContext(), "", flag));
     EXPECT_EQ(overTls.failure, "");
     ASSERT_NE(dynamic_cast<Tarvel::Ssl::SSLStream *>(overTls.stream.get()), nullptr);
+    EXPECT_TRUE(overTls.stream->IsSecure());
     overTls.stream->Close();
   }
 }
 
-TEST(SsoConnectionSpec, PassesStreamAndFailureOnWhenTheConnectFails) {
+TEST(SsoConnectionSpec, ReportsStreamAndFailureWhenTheConnectFails) {
   const Testing::UnusedPort unused;
   const std::string failure =
       "Cannot connect to 127.0.0.1:" + std::to_string(unused.GetPort()) + ": Connection refused";
@@ -115,7 +117,7 @@ TEST(SsoConnectionSpec, PassesStreamAndFailureOnWhenTheConnectFails) {
   }
 }
 
-TEST(SsoConnectionSpec, PassesTheTlsStreamOnWhenTheHandshakeFails) {
+TEST(SsoConnectionSpec, ReportsTheTlsStreamWhenTheHandshakeFails) {
   TlsSettings settings;
   settings.certificate = "expired";
   ScriptedServer server([](ServerConnection &connection) { connection.Handshake(); }, settings);
@@ -133,7 +135,7 @@ TEST(SsoConnectionSpec, FailsEachConnectionWithoutAContext) {
   connected.stream->Close();
 }
 
-/// Has something else to throw where a TLS stream is made.
+/// Throws when a TLS stream is created.
 class ThrowingContext final : public Tarvel::Ssl::SSLContext {
 public:
   explicit ThrowingContext(std::function<void()> raise) : m_raise(std::move(raise)) {}
@@ -152,7 +154,7 @@ private:
   const std::function<void()> m_raise;
 };
 
-TEST(SsoConnectionSpec, CallsItsCompletionForWhateverIsThrownBetweenConnectAndHandshake) {
+TEST(SsoConnectionSpec, CallsItsCompletionWhenTheContextThrows) {
   ScriptedServer server([](ServerConnection &connection) { connection.Stall(); });
   const std::string foreign = "The connection to localhost:" + std::to_string(server.GetPort()) + " failed: ";
   struct Case {

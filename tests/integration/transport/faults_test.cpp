@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
-// Each way in which a service, or the network before it, can misbehave: the exception, that it comes at once and not with
-// the time-out, and that the same client works afterwards.
+// Each way in which a service, or the network before it, can misbehave. The right exception is thrown at once, not
+// after the time-out, and the same client works afterwards.
 
 #include "integration/transport/service_stand_in.h"
 #include "system/name_lookup.h"
@@ -29,7 +29,7 @@ using Testing::Stopwatch;
 using Testing::TlsCertificate;
 using Testing::TlsSettings;
 
-/// Not even a sanitizer on a busy machine makes a fault of these take that long.
+/// Longer than any of these faults takes, even under a sanitizer on a busy machine.
 constexpr std::chrono::seconds AT_ONCE{20};
 
 const std::string OK = "HTTP/1.1 200 OK\r\n";
@@ -39,7 +39,7 @@ const std::string CHUNKED = OK + "Transfer-Encoding: chunked\r\n\r\n";
 struct Fault {
   std::string name;
   ScriptedServer::Script script;
-  std::string message; ///< %e stands for the endpoint
+  std::string message; ///< with %e in place of the endpoint
 };
 
 void PrintTo(const Fault &fault, std::ostream *out) {
@@ -67,12 +67,12 @@ void ExpectFault(const Fault &fault, std::optional<TlsSettings> tls) {
   EXPECT_EQ(AskForOutcome(*service.CreateSession()), "<after/>");
 }
 
-/// Reads the request, sends these bytes, ends the connection in order.
+/// Reads the request, sends these bytes, and ends the connection in an orderly way.
 ScriptedServer::Script Send(const std::string &bytes) {
   return Testing::AnswerWith(bytes);
 }
 
-/// The same, and ends the connection with a reset.
+/// The same, but ends the connection with a reset.
 ScriptedServer::Script SendAndReset(const std::string &bytes) {
   return [bytes](ServerConnection &connection) {
     connection.Handshake();
@@ -82,7 +82,7 @@ ScriptedServer::Script SendAndReset(const std::string &bytes) {
   };
 }
 
-/// The same, and leaves the connection open.
+/// The same, but leaves the connection open.
 ScriptedServer::Script SendAndStall(const std::string &bytes) {
   return [bytes](ServerConnection &connection) {
     connection.Handshake();
@@ -92,7 +92,7 @@ ScriptedServer::Script SendAndStall(const std::string &bytes) {
   };
 }
 
-/// Sends the same again and again until the client has had enough.
+/// Sends `repeated` until the client ends the connection.
 ScriptedServer::Script SendWithoutEnd(const std::string &start, const std::string &repeated) {
   return [start, repeated](ServerConnection &connection) {
     connection.Handshake();
@@ -106,7 +106,7 @@ ScriptedServer::Script SendWithoutEnd(const std::string &start, const std::strin
 const std::string BAD = "Bad response from %e: ";
 const std::string RESET = "The connection to %e broke: Connection reset by peer";
 
-// Over plain TCP and over TLS alike.
+// Used over plain TCP and over TLS.
 const Fault MISBEHAVIOUR[] = {
     {"EndBeforeTheHeader", Send(""), BAD + "the connection ended before it"},
     {"EndWithinTheHeader", Send("HTTP/1.1 200 OK\r\nContent-"), BAD + "the connection ended within its header"},
@@ -218,7 +218,7 @@ INSTANTIATE_TEST_SUITE_P(
               "The TLS handshake with localhost failed: error:0A00010B:SSL routines::wrong version number"}),
     NameOf);
 
-TEST(TransportBytesAfterTheEnd, AreIgnoredHoweverTheyArePacked) {
+TEST(TransportBytesAfterTheEnd, AreIgnoredInOneAndInTwoPieces) {
   const auto inTwoPieces = [](ServerConnection &connection) {
     connection.Handshake();
     connection.ReadRequest();
@@ -233,19 +233,19 @@ TEST(TransportBytesAfterTheEnd, AreIgnoredHoweverTheyArePacked) {
   }
 }
 
-TEST(TransportOverTlsWithoutNotice, TakesAResponseThatIsWholeByItsLength) {
+TEST(TransportOverTlsWithoutNotice, AcceptsAResponseThatIsCompleteByItsLength) {
   ServiceStandIn service(SendAndEndWithoutNotice(LENGTH_5 + "hello"), TlsSettings());
   EXPECT_EQ(AskForOutcome(*service.CreateSession()), "hello");
 }
 
-TEST(TransportOverTlsWithNotice, TakesABodyThatTheNoticeEnds) {
+TEST(TransportOverTlsWithNotice, AcceptsABodyThatTheNoticeEnds) {
   for (const std::string &start : {OK + "\r\n", std::string("HTTP/1.0 200 OK\r\n\r\n")}) {
     ServiceStandIn service(Send(start + "hello"), TlsSettings());
     EXPECT_EQ(AskForOutcome(*service.CreateSession()), "hello");
   }
 }
 
-/// A client of sts.example, which `first` looks up the first time; later it is at 127.0.0.1.
+/// Asks sts.example, which `first` looks up the first time; later look-ups return 127.0.0.1.
 void ExpectFaultOfTheConnect(const Tarvel::System::NameLookup &first, const std::string &message) {
   ScriptedServer server(Testing::AnswerWith(Testing::Response("200 OK", "<after/>")));
   const std::string endpoint = "sts.example:" + std::to_string(server.GetPort());
@@ -261,21 +261,21 @@ void ExpectFaultOfTheConnect(const Tarvel::System::NameLookup &first, const std:
   EXPECT_EQ(AskForOutcome(*session), "<after/>");
 }
 
-TEST(TransportConnect, ThatIsRefusedIsReportedAtOnceAndTheClientWorksAfterwards) {
+TEST(TransportConnect, ReportsARefusalAtOnceAndWorksAfterwards) {
   // The server listens over IPv4 only.
   ExpectFaultOfTheConnect([](const std::string &) { return AddressList{boost::asio::ip::make_address("::1")}; },
                           "Cannot connect to %e: Connection refused");
 }
 
-TEST(TransportConnect, ToAnUnknownHostIsReportedAtOnceAndTheClientWorksAfterwards) {
+TEST(TransportConnect, ReportsAnUnknownHostAtOnceAndWorksAfterwards) {
   ExpectFaultOfTheConnect(
       [](const std::string &) -> AddressList { throw Tarvel::System::NetworkException("Name or service not known"); },
       "Cannot connect to %e: Name or service not known");
 }
 
-/// The first connection ends with what `settings` say, before anything of the request is sent; the server is as `repaired`
-/// then, and the same client works.
-/// @return what came of the first.
+/// The first connection, to a server with `settings`, fails before anything of the request is sent. Then the server
+/// gets the settings `repaired`, and the same client works.
+/// @return the outcome of the first request.
 std::string AskRefusedAndThenRepairedServer(const TlsSettings &settings, const std::string &parameter = "",
                                             const TlsSettings &repaired = {}) {
   const auto receivedRequest = std::make_shared<std::atomic<bool>>(false);
@@ -300,21 +300,21 @@ TEST(TransportServerIdentity, IsRefusedWithItsReasonBeforeAnythingIsSent) {
     std::string certificate;
     std::string reason;
   };
-  for (const Case &bad :
+  for (const Case &refused :
        {Case{"expired", "certificate has expired"}, Case{"self-signed", "self-signed certificate"},
         Case{"other-host", "hostname mismatch"}, Case{"untrusted", "unable to get local issuer certificate"}}) {
     for (const int version : {TLS1_2_VERSION, TLS1_3_VERSION}) {
       TlsSettings settings;
-      settings.certificate = bad.certificate;
+      settings.certificate = refused.certificate;
       settings.minimumVersion = settings.maximumVersion = version;
       EXPECT_EQ(AskRefusedAndThenRepairedServer(settings),
                 Failure("The TLS handshake with localhost failed: the server's certificate was not accepted: " +
-                        bad.reason + " (certificate \"CN=" + bad.certificate + "\")"));
+                        refused.reason + " (certificate \"CN=" + refused.certificate + "\")"));
     }
   }
 }
 
-TEST(TransportServerIdentity, OfAnotherThumbprintIsRefused) {
+TEST(TransportServerIdentity, IsRefusedWithAnotherThumbprint) {
   TlsSettings expected;
   expected.certificate = "self-signed";
   const std::string right = TlsCertificate("self-signed")->GetSha256Thumbprint();
@@ -324,7 +324,7 @@ TEST(TransportServerIdentity, OfAnotherThumbprintIsRefused) {
                     shown + " instead of " + right));
 }
 
-TEST(TransportServerIdentity, OfTheRightThumbprintNeedsNoAuthority) {
+TEST(TransportServerIdentity, NeedsNoAuthorityWithAMatchingThumbprint) {
   TlsSettings settings;
   settings.certificate = "self-signed";
   ServiceStandIn service(Send(LENGTH_5 + "hello"), settings, Testing::NO_TIMEOUT, "localhost",
@@ -332,7 +332,7 @@ TEST(TransportServerIdentity, OfTheRightThumbprintNeedsNoAuthority) {
   EXPECT_EQ(AskForOutcome(*service.CreateSession()), "hello");
 }
 
-TEST(TransportServerIdentity, WithOldTlsOnlyIsRefused) {
+TEST(TransportServer, IsRefusedWhenItOffersOnlyOldTls) {
   TlsSettings settings;
   settings.minimumVersion = settings.maximumVersion = TLS1_1_VERSION;
   settings.allowsWeakness = true;
@@ -340,7 +340,7 @@ TEST(TransportServerIdentity, WithOldTlsOnlyIsRefused) {
   EXPECT_EQ(outcome.rfind(Failure("The TLS handshake with localhost failed: error:"), 0), 0u) << outcome;
 }
 
-TEST(TransportServerIdentity, ThatDemandsACertificateWhichTheClientHasNotFails) {
+TEST(TransportServer, RefusesAClientWithoutTheRequiredCertificate) {
   for (const int version : {TLS1_2_VERSION, TLS1_3_VERSION}) {
     TlsSettings settings;
     settings.demandsClient = true;
@@ -351,7 +351,7 @@ TEST(TransportServerIdentity, ThatDemandsACertificateWhichTheClientHasNotFails) 
   }
 }
 
-TEST(TransportResumption, MakesTheSecondRequestsHandshakeAnAbbreviatedOne) {
+TEST(TransportResumption, AbbreviatesTheHandshakeOfLaterRequests) {
   for (const int version : {TLS1_2_VERSION, TLS1_3_VERSION}) {
     TlsSettings settings;
     settings.minimumVersion = settings.maximumVersion = version;

@@ -35,7 +35,7 @@ using Testing::ServerConnection;
 using Testing::ServiceStandIn;
 using Testing::TlsSettings;
 
-TEST(HttpsClient, RefusesHttpsWithoutAContextAtItsConstruction) {
+TEST(HttpsClient, CannotBeMadeForHttpsWithoutAContext) {
   EXPECT_THROWS_MESSAGE(HttpsClient("https://sts.example/STS", nullptr, "", NO_TIMEOUT),
                         Tarvel::InvalidArgumentException,
                         "Invalid argument : HTTPS connection requested but no SSLContext provided.");
@@ -44,12 +44,12 @@ TEST(HttpsClient, RefusesHttpsWithoutAContextAtItsConstruction) {
                         "Invalid argument : HTTPS connection requested but no SSLContext provided.");
 }
 
-TEST(HttpsClient, TakesHttpWithoutAContext) {
+TEST(HttpsClient, CanBeMadeForHttpWithoutAContext) {
   EXPECT_NO_THROW(HttpsClient("http://sts.example/STS", nullptr, "", NO_TIMEOUT));
   EXPECT_NO_THROW(HttpsClient("http://sts.example/STS", nullptr, "", NO_TIMEOUT, true));
 }
 
-TEST(HttpsClient, LetsTheRefusalOfAMalformedAddressThrough) {
+TEST(HttpsClient, CannotBeMadeForAMalformedAddress) {
   EXPECT_THROWS_MESSAGE(HttpsClient("ftp://sts.example", nullptr, "", NO_TIMEOUT), Tarvel::Http::MalformedURLException,
                         "Malformed URL \"ftp://sts.example\": the scheme is not http or https");
 }
@@ -100,7 +100,7 @@ TEST(HttpsSession, PostsAndReadsLargeMessagesOverTls) {
   EXPECT_EQ(Ask(*service.CreateSession(), SampleRequest(large)), large);
 }
 
-TEST(HttpsSession, LetsNothingIntoTheHeaderThroughTheAction) {
+TEST(HttpsSession, RefusesAnActionThatWouldEndItsHeader) {
   ServiceStandIn service(AnswerWith(Response("200 OK", "")));
   Request request = SampleRequest();
   request.soapAction = "a\"\r\nX-Evil: 1";
@@ -110,24 +110,24 @@ TEST(HttpsSession, LetsNothingIntoTheHeaderThroughTheAction) {
   EXPECT_EQ(service.GetServer().GetConnectionCount(), 0);
 }
 
-TEST(HttpsSession, HandsTheBodyOnForEvery2xxAndFor500) {
+TEST(HttpsSession, ReturnsTheBodyForEvery2xxAndFor500) {
   for (const std::string status : {"200 OK", "201 Created", "299 Unheard Of", "500 Internal Server Error", "500"}) {
     ServiceStandIn service(AnswerWith(Response(status + (status == "500" ? " " : ""), "<body/>")));
     EXPECT_EQ(AskForOutcome(*service.CreateSession()), "<body/>") << status;
   }
 }
 
-TEST(HttpsSession, GivesAnEmptyBodyForNoContent) {
+TEST(HttpsSession, ReturnsAnEmptyBodyForNoContent) {
   ServiceStandIn service(AnswerWith("HTTP/1.1 204 No Content\r\n\r\n"));
   EXPECT_EQ(AskForOutcome(*service.CreateSession()), "");
 }
 
-TEST(HttpsSession, NamesCodeAndReasonOfEveryOtherStatus) {
+TEST(HttpsSession, ReportsCodeAndReasonOfEveryOtherStatus) {
   for (const std::string status :
        {"101 Switching Protocols", "300 Multiple Choices", "302 Found", "304 Not Modified", "400 Bad Request",
         "401 Unauthorized", "404 Not Found", "407 Proxy Authentication Required", "499 x", "501 Not Implemented",
         "503 Service Unavailable", "599 y", "600 z"}) {
-    // To where a redirect leads, nobody goes.
+    // Redirects are not followed.
     ServiceStandIn service(AnswerWith("HTTP/1.1 " + status + "\r\nLocation: /elsewhere\r\nContent-Length: 0\r\n\r\n"));
     EXPECT_EQ(AskForOutcome(*service.CreateSession()), Failure("Server returned error: " + status));
     EXPECT_EQ(service.GetServer().GetConnectionCount(), 1);
@@ -137,7 +137,7 @@ TEST(HttpsSession, NamesCodeAndReasonOfEveryOtherStatus) {
 const char LATIN1[] = "Content-Type: text/xml; charset=\"ISO-8859-1\"\r\n";
 const char DECLARATION[] = "<?xml version=\"1.0\" encoding=\"ISO-8859-1\"?>";
 
-/// The name of the document's root and its text, or what was thrown.
+/// The name of the document's root and its text, or the message of the exception.
 std::string ReadDocument(const std::string &response) {
   ServiceStandIn service(AnswerWith(response));
   try {
@@ -150,14 +150,14 @@ std::string ReadDocument(const std::string &response) {
   }
 }
 
-TEST(HttpsSession, HandsOnADocumentOfLatin1ThatCanBeParsed) {
+TEST(HttpsSession, ReturnsALatin1DocumentThatCanBeParsed) {
   for (const std::string &start : {std::string(), std::string(DECLARATION)}) {
     EXPECT_EQ(ReadDocument(Response("200 OK", start + "<a>\xFC</a>", LATIN1)), "a: \xC3\xBC");
     EXPECT_EQ(ReadDocument(Response("500 Fault", start + "<a>u</a>", LATIN1)), "a: u");
   }
 }
 
-TEST(HttpsSession, NamesTheCharsetOfADocumentThatCannotBeParsed) {
+TEST(HttpsSession, ReportsTheCharsetOfADocumentThatCannotBeParsed) {
   const std::string refusal = "Response is not well-formed XML: ";
   for (const char *const charset : {"windows-1252", "us-ascii"}) {
     EXPECT_EQ(ReadDocument(
@@ -172,32 +172,32 @@ TEST(HttpsSession, NamesTheCharsetOfADocumentThatCannotBeParsed) {
                       "(charset ISO-8859-1)");
 }
 
-TEST(HttpsSession, LeavesTheLengthOfWhatBecameLongerAsUtf8ToTheParser) {
+TEST(HttpsSession, LetsTheParserLimitABodyThatIsLongerAsUtf8) {
   const std::string body(Tarvel::Http::MAX_BODY_BYTES, '\xFC');
   EXPECT_EQ(ReadDocument(Response("200 OK", body, LATIN1)),
             "Response is not well-formed XML: the document is longer than 16777216 bytes at line 1, column 16777217 "
             "(charset ISO-8859-1)");
 }
 
-TEST(HttpsSession, LetsTheStatusDecideBeforeTheCharset) {
+TEST(HttpsSession, ReportsTheStatusWhateverTheCharset) {
   for (const char *const charset : {"ISO-8859-1", "windows-1252"}) {
     const std::string type = std::string("Content-Type: text/html;charset=") + charset + "\r\n";
     EXPECT_EQ(ReadDocument(Response("503 Down", "<a>\xFC</a>", type)), "Server returned error: 503 Down");
   }
 }
 
-TEST(HttpsSession, EndsInABlankWhenTheReasonIsEmpty) {
+TEST(HttpsSession, ReportsAStatusWithoutReasonWithAFinalBlank) {
   ServiceStandIn service(AnswerWith("HTTP/1.1 404 \r\nContent-Length: 0\r\n\r\n"));
   EXPECT_EQ(AskForOutcome(*service.CreateSession()), Failure("Server returned error: 404 "));
 }
 
-TEST(HttpsSession, PassesOverInterimResponses) {
+TEST(HttpsSession, SkipsInterimResponses) {
   ServiceStandIn service(
       AnswerWith("HTTP/1.1 100 Continue\r\n\r\nHTTP/1.1 102 Processing\r\n\r\n" + Response("200 OK", "<body/>")));
   EXPECT_EQ(AskForOutcome(*service.CreateSession()), "<body/>");
 }
 
-TEST(HttpsSession, LeavesAReaderThatOutlivesItsSessionAndClient) {
+TEST(HttpsSession, ReturnsAReaderThatOutlivesItsSessionAndClient) {
   Ref<Tarvel::Reader> response;
   {
     ServiceStandIn service(AnswerWith(Response("200 OK", "<body/>")));
@@ -206,7 +206,7 @@ TEST(HttpsSession, LeavesAReaderThatOutlivesItsSessionAndClient) {
   EXPECT_EQ(response->ReadToEnd(100), "<body/>");
 }
 
-/// What the asynchronous form calls back with.
+/// The arguments of the asynchronous form's callback.
 struct Outcome {
   std::string failure;
   std::string body;
@@ -272,7 +272,7 @@ TEST(HttpsSession, SurvivesACallbackThatThrows) {
   EXPECT_EQ(AskForOutcome(*session), "<body/>");
 }
 
-/// Notes the Cookie header of each request, and sets cookies in its answers.
+/// Records the Cookie header of each request, and sets cookies in its answers.
 class CookieService {
 public:
   explicit CookieService(std::vector<std::string> setCookies, bool tls = false)
@@ -289,7 +289,7 @@ public:
             },
             tls ? std::optional(TlsSettings()) : std::nullopt) {}
 
-  /// What the next request of `session` tells; "" for no cookie.
+  /// The cookies that the next request of `session` sends; empty when it sends none.
   std::string AskForCookies(TransportSession &session) {
     Ask(session);
     const std::lock_guard<std::mutex> lock(m_mutex);
@@ -312,7 +312,7 @@ private:
   ServiceStandIn m_service; // last: its threads use the others
 };
 
-TEST(HttpsSession, SendsTheCookiesOfOneLegInTheNextLegsOfItsSessionOnly) {
+TEST(HttpsSession, SendsTheCookiesOfOneLegOnlyInLaterLegsOfItsSession) {
   CookieService service({"leg=1", "node=7; Path=/STS"});
   const auto session = service.CreateSession();
   EXPECT_EQ(service.AskForCookies(*session), "");

@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// A service on loopback, and the client that asks it.
+/// A service on loopback, and its client.
 
 #pragma once
 
@@ -53,7 +53,7 @@ inline std::string Ask(SsoClient::TransportSession &session, const SsoClient::Re
   return response->ReadToEnd(Tarvel::Http::MAX_BODY_BYTES);
 }
 
-/// The body, or class and message of what was thrown.
+/// The body, or the class and message of the exception.
 inline std::string AskForOutcome(SsoClient::TransportSession &session,
                                  const SsoClient::Request &request = SampleRequest()) {
   try {
@@ -69,10 +69,10 @@ inline std::string Failure(const std::string &message) {
   return "CommunicationException: " + message;
 }
 
-/// A service, its client, and what its address is.
+/// A service with its client and address.
 class ServiceStandIn {
 public:
-  /// @param tls none for http. The client trusts the authority of the server's certificate.
+  /// @param tls nullopt for http. The client trusts the authority of the server's certificate.
   explicit ServiceStandIn(ScriptedServer::Script script, std::optional<TlsSettings> tls = std::nullopt,
                           std::int64_t timeout = NO_TIMEOUT, const std::string &host = "localhost",
                           const std::string &sslParameter = "")
@@ -90,7 +90,7 @@ private:
   const SsoClient::HttpsClient m_client;
 };
 
-/// A script that does `fault` at the first connection, and answers all later ones.
+/// A script that runs `fault` for the first connection and answers all later ones.
 inline ScriptedServer::Script FaultThenAnswer(ScriptedServer::Script fault) {
   const auto count = std::make_shared<std::atomic<int>>(0);
   return [fault = std::move(fault), count](ServerConnection &connection) {
@@ -108,7 +108,7 @@ private:
   const std::chrono::steady_clock::time_point m_start = std::chrono::steady_clock::now();
 };
 
-/// Connected sockets of this process whose peer is `port`; it does not count a server's own side.
+/// The number of connected sockets of this process whose peer has this port; the server's side is not counted.
 std::size_t CountConnectionsTo(int port);
 
 } // namespace Testing

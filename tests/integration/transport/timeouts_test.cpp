@@ -1,5 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
-// One time-out covers everything from the connect to the last byte, and leaves nothing behind.
+// One time-out covers everything from the connect to the last byte, and leaks nothing.
 
 #include "integration/transport/service_stand_in.h"
 #include "support/completion.h"
@@ -56,7 +56,7 @@ ScriptedServer::Script StallAfter(const std::string &bytes) {
   };
 }
 
-/// A byte at a time, each well within the time-out.
+/// Sends one byte at a time, each well within the time-out.
 ScriptedServer::Script Drip(const std::string &bytes) {
   return [bytes](ServerConnection &connection) {
     connection.Handshake();
@@ -74,14 +74,14 @@ std::string NameOf(const testing::TestParamInfo<Delay> &info) {
   return info.param.name;
 }
 
-/// The time-out is short for a busy machine, so it may take more than one request.
+/// May need more than one request, because the time-out is short for a busy machine.
 bool WorksAgain(TransportSession &session) {
   return Eventually([&session] { return AskForOutcome(session) == "<after/>"; });
 }
 
-class TransportTimeout : public testing::TestWithParam<Delay> {};
+class TransportTimeoutOfAService : public testing::TestWithParam<Delay> {};
 
-TEST_P(TransportTimeout, EndsTheRequestInTimeAndLeavesNothingBehind) {
+TEST_P(TransportTimeoutOfAService, EndsTheRequestInTimeAndLeaksNothing) {
   ServiceStandIn service(FaultThenAnswer(GetParam().script),
                          GetParam().tls ? std::optional(TlsSettings()) : std::nullopt, SHORT);
   const auto session = service.CreateSession();
@@ -96,7 +96,7 @@ TEST_P(TransportTimeout, EndsTheRequestInTimeAndLeavesNothingBehind) {
 
 const std::string DRIPPED = "HTTP/1.1 200 OK\r\nContent-Length: 500\r\n\r\n" + std::string(500, 'x');
 
-INSTANTIATE_TEST_SUITE_P(Delays, TransportTimeout,
+INSTANTIATE_TEST_SUITE_P(Delays, TransportTimeoutOfAService,
                          testing::Values(Delay{"StallBeforeTheHandshakeEnds", true,
                                                [](ServerConnection &connection) { connection.Stall(); }},
                                          Delay{"StallBeforeTheRequestIsRead", false,
@@ -115,7 +115,7 @@ INSTANTIATE_TEST_SUITE_P(Delays, TransportTimeout,
                                          Delay{"DripOverTls", true, Drip(DRIPPED)}),
                          NameOf);
 
-TEST(TransportTimeoutOfTheConnect, EndsTheRequestInTimeAndLeavesNothingBehind) {
+TEST(TransportTimeout, EndsAConnectInTimeAndLeaksNothing) {
   Testing::FullPort full;
   const std::string endpoint = "127.0.0.1:" + std::to_string(full.GetPort());
   const HttpsClient client("http://" + endpoint, nullptr, "", SHORT);
@@ -135,7 +135,7 @@ TEST(TransportTimeoutOfTheConnect, EndsTheRequestInTimeAndLeavesNothingBehind) {
   server.join();
 }
 
-TEST(TransportTimeoutOfTheLookup, EndsTheRequestInTime) {
+TEST(TransportTimeout, EndsALookupInTime) {
   const auto release = std::make_shared<std::promise<void>>();
   const auto released = std::make_shared<std::shared_future<void>>(release->get_future());
   const Tarvel::System::ScopedNameLookup lookup([released](const std::string &) {
@@ -149,7 +149,7 @@ TEST(TransportTimeoutOfTheLookup, EndsTheRequestInTime) {
   release->set_value();
 }
 
-TEST(TransportTimeoutOfNothing, EndsTheRequestAtOnce) {
+TEST(TransportTimeout, EndsTheRequestAtOnceWhenItIsNotPositive) {
   for (const std::int64_t timeout : {std::int64_t(0), std::int64_t(-1), std::int64_t(1)}) {
     ServiceStandIn service([](ServerConnection &connection) { connection.Stall(); }, std::nullopt, timeout);
     const std::string outcome = AskForOutcome(*service.CreateSession());
@@ -158,16 +158,16 @@ TEST(TransportTimeoutOfNothing, EndsTheRequestAtOnce) {
   }
 }
 
-TEST(TransportTimeoutOfAnAge, DoesNotOverflow) {
+TEST(TransportTimeout, DoesNotOverflow) {
   ServiceStandIn service(Testing::AnswerWith(Testing::Response("200 OK", "<body/>")), std::nullopt,
                          std::numeric_limits<std::int64_t>::max());
   EXPECT_EQ(AskForOutcome(*service.CreateSession()), "<body/>");
 }
 
-TEST(TransportTimeoutRepeated, GrowsNeitherDescriptorsNorThreads) {
+TEST(TransportTimeout, LeaksNoDescriptorAndNoThreadWhenRepeated) {
   constexpr std::int64_t VERY_SHORT = 10000; // microseconds
   ServiceStandIn service([](ServerConnection &connection) { connection.Stall(); }, TlsSettings(), VERY_SHORT);
-  AskForOutcome(*service.CreateSession()); // starts whatever threads there will be
+  AskForOutcome(*service.CreateSession()); // starts all threads that later requests use
   const auto isQuiet = [&] { return service.GetServer().GetOpenCount() == 0; };
   ASSERT_TRUE(Eventually(isQuiet));
   ASSERT_TRUE(Eventually([&] { return CountConnectionsTo(service.GetServer().GetPort()) == 0; }));

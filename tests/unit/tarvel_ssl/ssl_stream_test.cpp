@@ -3,11 +3,8 @@
 #include "unit/tarvel_ssl/tls_client.h"
 
 #include "support/process_resources.h"
-#include "system/io_engine.h"
 
 #include <tarvel/core/exception.h>
-
-#include <boost/asio/post.hpp>
 
 #include <gtest/gtest.h>
 
@@ -15,11 +12,7 @@
 #include <openssl/ssl.h>
 
 #include <atomic>
-#include <cstdlib>
-#include <functional>
 #include <future>
-#include <new>
-#include <stdexcept>
 #include <string>
 #include <vector>
 
@@ -214,168 +207,6 @@ TEST(SSLStream, ReportsAnOrderlyEndWithinTheHandshake) {
   EXPECT_EQ(client.Handshake(), "The TLS handshake with localhost failed: the server ended the connection");
 }
 
-/// A stream over TCP. After `Break` its writes fail, as they do when the server has reset the connection.
-class BrokenWriter final : public System::Stream {
-public:
-  explicit BrokenWriter(const Ref<System::Stream> &inner) : m_inner(inner) {}
-
-  void Break() { m_isBroken = true; }
-
-  void AsyncReadSome(char *buffer, std::size_t length, TransferHandler handler) override {
-    m_inner->AsyncReadSome(buffer, length, std::move(handler));
-  }
-  void AsyncWrite(const char *bytes, std::size_t length, TransferHandler handler) override {
-    if (!m_isBroken) {
-      m_inner->AsyncWrite(bytes, length, std::move(handler));
-      return;
-    }
-    boost::asio::post(System::GetIoContext(), [handler = std::move(handler)] {
-      const System::NetworkException failure("Broken pipe");
-      handler(0, &failure);
-    });
-  }
-  void Close() noexcept override { m_inner->Close(); }
-
-private:
-  const Ref<System::Stream> m_inner;
-  std::atomic<bool> m_isBroken{false};
-};
-
-/// A TLS connection on which writing breaks, before or after the handshake, and reading goes on.
-class BrokenConnection {
-public:
-  BrokenConnection(int port, bool beforeTheHandshake) {
-    const auto socket = System::CreateTcpClientSocket();
-    Completion connected;
-    socket->AsyncConnect("127.0.0.1", port, connected.ForEnd());
-    EXPECT_EQ(connected.GetMessage(), "");
-    const auto lower = MakeRef<BrokenWriter>(socket);
-    m_context = CreateTrustingContext();
-    stream = m_context->CreateStream(lower, "localhost");
-    if (beforeTheHandshake) {
-      lower->Break();
-    }
-    stream->AsyncHandshake("localhost", "", handshake.ForEnd());
-    EXPECT_TRUE(handshake.Wait());
-    lower->Break();
-  }
-
-  std::string Write(const std::string &bytes) const {
-    Completion written;
-    stream->AsyncWrite(bytes.data(), bytes.size(), written.ForTransfer());
-    return written.GetMessage();
-  }
-  std::string Read() const {
-    std::string bytes(100, '\0');
-    Completion read;
-    stream->AsyncReadSome(bytes.data(), bytes.size(), read.ForTransfer());
-    const std::string failure = read.GetMessage();
-    return failure.empty() ? bytes.substr(0, read.GetCount()) : failure;
-  }
-
-  Ref<SSLStream> stream;
-  Completion handshake;
-
-private:
-  Ref<SSLContext> m_context;
-};
-
-/// A host's own stream. Each start throws what the test chooses.
-class ThrowingStream final : public System::Stream {
-public:
-  explicit ThrowingStream(std::function<void()> start) : m_start(std::move(start)) {}
-
-  void AsyncReadSome(char *, std::size_t, TransferHandler) override { m_start(); }
-  void AsyncWrite(const char *, std::size_t, TransferHandler) override { m_start(); }
-  void Close() noexcept override {}
-
-private:
-  const std::function<void()> m_start;
-};
-
-TEST(SSLStream, EndsTheHandshakeOnceWhenTheStreamBelowThrows) {
-  const std::string failed = "The TLS handshake with localhost failed: ";
-  struct Case {
-    std::function<void()> start;
-    std::string message;
-  };
-  for (const Case &thrown : {Case{[] { throw InvalidStateException("ours"); }, failed + "ours"},
-                             Case{[] { throw std::runtime_error("foreign"); }, failed + "foreign"},
-                             Case{[] { throw 1; }, failed + "an object that is not an exception was thrown"},
-                             Case{[] { throw std::bad_alloc(); }, "There is not enough memory"}}) {
-    const Ref<SSLStream> stream =
-        CreateTrustingContext()->CreateStream(MakeRef<ThrowingStream>(thrown.start), "localhost");
-    Completion handshake;
-    stream->AsyncHandshake("localhost", "", handshake.ForEnd());
-    EXPECT_EQ(handshake.GetMessage(), thrown.message);
-    stream->Close();
-    EXPECT_TRUE(Testing::DrainIoThreads());
-    EXPECT_EQ(handshake.GetCalls(), 1);
-  }
-}
-
-TEST(SSLStream, ReadsBytesThatTheServerSentAfterAFailedWrite) {
-  std::promise<void> failed;
-  ScriptedServer server(
-      [future = failed.get_future().share()](ServerConnection &connection) {
-        connection.Handshake();
-        future.wait_for(PATIENCE);
-        connection.Write("413");
-      },
-      TlsSettings());
-  const BrokenConnection client(server.GetPort(), false);
-  const std::string broken = "The TLS connection to localhost broke: Broken pipe";
-  EXPECT_EQ(client.Write("request"), broken);
-  EXPECT_EQ(client.Write("again"), broken);
-  failed.set_value();
-  EXPECT_EQ(client.Read(), "413");
-  EXPECT_EQ(client.Read(), "");
-}
-
-TEST(SSLStream, ReportsTheFailedWriteWhenTheServerEndsWithoutNotice) {
-  std::promise<void> failed;
-  ScriptedServer server(
-      [future = failed.get_future().share()](ServerConnection &connection) {
-        connection.Handshake();
-        future.wait_for(PATIENCE);
-        connection.CloseWithoutNotice();
-      },
-      TlsSettings());
-  const BrokenConnection client(server.GetPort(), false);
-  const std::string broken = "The TLS connection to localhost broke: Broken pipe";
-  EXPECT_EQ(client.Write("request"), broken);
-  failed.set_value();
-  EXPECT_EQ(client.Read(), broken);
-}
-
-TEST(SSLStream, ReportsTheAlertOfAHandshakeInWhichNothingCanBeWritten) {
-  ScriptedServer server([](ServerConnection &connection) {
-    connection.WriteRaw(std::string("\x15\x03\x03\x00\x02\x02\x28", 7)); // fatal, handshake failure
-    connection.Stall();
-  });
-  const BrokenConnection client(server.GetPort(), true);
-  EXPECT_EQ(client.handshake.GetMessage(), "The TLS handshake with localhost failed: error:0A000410:SSL routines::"
-                                           "sslv3 alert handshake failure (SSL alert number 40)");
-}
-
-TEST(SSLStream, ReportsTheFailedWriteOfAHandshakeThatTheServerEnds) {
-  ScriptedServer server([](ServerConnection &connection) { connection.CloseWithoutNotice(); });
-  const BrokenConnection client(server.GetPort(), true);
-  EXPECT_EQ(client.handshake.GetMessage(), "The TLS handshake with localhost failed: Broken pipe");
-}
-
-TEST(SSLStream, ReportsThatACertificateIsRequired) {
-  TlsSettings settings;
-  settings.demandsClient = true;
-  settings.minimumVersion = TLS1_3_VERSION;
-  ScriptedServer server([](ServerConnection &connection) { connection.Handshake(); }, settings);
-  const BrokenConnection client(server.GetPort(), false);
-  EXPECT_EQ(client.handshake.GetMessage(), "");
-  EXPECT_EQ(client.Write("request"), "The TLS connection to localhost broke: Broken pipe");
-  EXPECT_EQ(client.Read(), "The TLS connection to localhost broke: error:0A00045C:SSL routines::"
-                           "tlsv13 alert certificate required (SSL alert number 116)");
-}
-
 TEST(SSLStream, ReportsAServerThatDoesNotSpeakTls) {
   ScriptedServer server([](ServerConnection &connection) {
     connection.ReadRawSome();
@@ -545,36 +376,6 @@ TEST(SSLStream, ServesManyConnectionsAtOnce) {
     thread.join();
   }
   EXPECT_EQ(right, 80);
-}
-
-/// Ends the process during handshakes. The server uses no OpenSSL, so that only the clients' use of it is tested.
-void EndWhileBusy() {
-  auto *const server = new ScriptedServer([](ServerConnection &connection) {
-    connection.ReadRawSome();
-    connection.Reset();
-  });
-  const Ref<SSLContext> context = CreateTrustingContext();
-  static std::atomic<int> attempts{0};
-  for (int t = 0; t < 4; ++t) {
-    std::thread([context, port = server->GetPort()] {
-      for (;; ++attempts) {
-        try {
-          TlsClient(context, port).Handshake();
-        } catch (const std::exception &) {
-          // The server resets connections at any time.
-        }
-      }
-    }).detach();
-  }
-  Testing::Eventually([] { return attempts > 20; });
-  std::exit(0);
-}
-
-TEST(SSLStreamDeathTest, LetsTheProcessEndDuringHandshakes) {
-  testing::FLAGS_gtest_death_test_style = "threadsafe";
-  for (int i = 0; i < 20; ++i) {
-    ASSERT_EXIT(EndWhileBusy(), testing::ExitedWithCode(0), "") << i;
-  }
 }
 
 } // namespace

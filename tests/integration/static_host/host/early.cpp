@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
-// A host whose first static object does all that the library is for, before anything of the library, or of Asio in it, has
-// been initialised. It uses plain functions of C for its output: the streams are static objects, too.
+// A host whose first static object uses all main functions of the library, before any static object of the library, or
+// of Asio in it, is initialised. It prints with C functions, because the C++ streams are static objects too.
 #include <ssoclient/create_saml_token.h>
 #include <ssoclient/descriptions.h>
 #include <ssoclient/security_token_service.h>
@@ -93,8 +93,7 @@ void UseAll() {
   }
 }
 
-/// In one file, and with one priority, static objects are initialised in the order in which they are declared; with this
-/// priority before those of all other files.
+/// With this priority it is initialised before the static objects of all other files.
 struct EarlyUse {
   EarlyUse() { UseAll(); }
 };

@@ -1,5 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
-// A host that ends while a worker's request over TLS is under way; a static object waits for the worker.
+// A host that ends while a request over TLS is under way on another thread. A static object waits for that thread.
 #include "support/outliving_thread.h"
 
 #include <ssoclient/exceptions.h>
@@ -14,7 +14,7 @@
 
 namespace {
 
-/// Destroyed after OpenSSL's own state, for it is made before.
+/// Destroyed after OpenSSL's own state, because it is created before.
 struct Worker {
   ~Worker() {
     thread.join();
@@ -55,7 +55,7 @@ int main() {
     const std::string outcome = Acquire("HTTPS");
     std::printf("worker: %s\n", outcome.c_str());
   });
-  // Answered once the worker's request has come in.
+  // Answered when the worker's request has arrived.
   const std::string outcome = Acquire("HTTP");
   std::printf("main: %s\n", outcome.c_str());
 }

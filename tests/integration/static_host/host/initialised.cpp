@@ -1,5 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
-// What no file of the libraries may do: set a variable by a call before main.
+// Sets a variable by a call before main, which no file of the libraries may do.
 #include <unistd.h>
 
 extern const pid_t INITIALISED_BEFORE_MAIN;

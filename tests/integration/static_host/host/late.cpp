@@ -1,6 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
-// A host whose workers use the library while its static objects are being destroyed, which wait for them. WORK says what
-// the worker does.
+// A host whose threads use the library while its static objects, which wait for these threads, are being destroyed.
 #include <ssoclient/create_saml_token.h>
 #include <ssoclient/security_token_service.h>
 #include <tarvel/ssl/ssl_context.h>
@@ -50,7 +49,7 @@ void Report(const char *what, const std::function<std::string()> &use) {
   }
 }
 
-/// Work that begins, in a thread of its own, when this is destroyed, which then waits for it.
+/// Its destructor starts the work on another thread and waits for it.
 class LateWorker {
 public:
   void Begin(std::function<void()> work) {
@@ -72,7 +71,7 @@ private:
   std::thread m_thread;
 };
 
-/// Destroyed after everything that is made later, OpenSSL's own state included.
+/// Destroyed after everything that is created later, including OpenSSL's own state.
 [[gnu::init_priority(101)]] LateWorker g_lastOfAll;
 
 Tarvel::Crypto::CertificateList Trusted() {
@@ -83,7 +82,7 @@ void Verify(const char *token, const Tarvel::Crypto::CertificateList &trusted) {
   Report(token, [&] { return SsoClient::CreateSamlToken(ReadData(token), trusted)->GetSubject().ToString(); });
 }
 
-/// Nothing that needs a key or a digest.
+/// Does only work that needs no key and no digest.
 void Compute(const TokenPtr &token) {
   Report("computed", [&] {
     std::promise<std::string> text;
@@ -98,7 +97,7 @@ void Compute(const TokenPtr &token) {
 int main() {
   const Tarvel::Crypto::CertificateList trusted = Trusted();
   const TokenPtr token = SsoClient::CreateSamlToken(ReadData("tokens/bearer.xml"), trusted);
-  // Destroyed before OpenSSL's state, which there is already.
+  // Destroyed before OpenSSL's state, which exists already.
   static LateWorker beforeOpenSsl;
   beforeOpenSsl.Begin([trusted] {
     Verify("tokens/bearer.xml", trusted);

@@ -1,6 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
-// What a configuration of OpenSSL does to the library: nothing, unless the host wants it; and then only more than we ask for.
-#include "integration/openssl_guest/host_process.h"
+// The effect of OpenSSL's configuration on the library: none, unless the host requests it; then it can only add
+// restrictions.
+#include "integration/openssl_host/host_process.h"
 #include "support/scripted_server.h"
 #include "support/work_folder.h"
 
@@ -18,7 +19,7 @@ using Testing::HostProcess;
 using Testing::ScriptedServer;
 using Testing::ServerConnection;
 using Testing::TlsSettings;
-using Deeds = std::vector<std::string>;
+using Steps = std::vector<std::string>;
 
 const std::string DONE = "handshake: \n";
 const std::string CONFIGURED = "configuration: done\n";
@@ -37,10 +38,10 @@ protected:
   }
   std::string Write(const std::string &text) { return m_folder.Write("openssl.cnf", text); }
 
-  /// What the host says, whose server is as `settings` say.
-  std::string Run(const TlsSettings &settings, const Deeds &deeds, const std::string &configuration) {
+  /// The output of a host, against a server with `settings`.
+  std::string Run(const TlsSettings &settings, const Steps &steps, const std::string &configuration) {
     ScriptedServer server([](ServerConnection &connection) { connection.Handshake(); }, settings);
-    return HostProcess(server.GetPort(), deeds, configuration).Finish();
+    return HostProcess(server.GetPort(), steps, configuration).Finish();
   }
 
   Testing::WorkFolder m_folder;
@@ -55,38 +56,38 @@ TlsSettings Tls12(const std::string &ciphers, const std::string &certificate = "
   return settings;
 }
 
-TEST_F(Configuration, ThatIsWeakChangesNothing) {
+TEST_F(Configuration, HasNoEffectWhenItIsWeak) {
   const std::string weak = TlsConfiguration("CipherString = ALL:eNULL:aNULL:@SECLEVEL=0\nMinProtocol = None\n"
                                             "SignatureAlgorithms = RSA+SHA1:ECDSA+SHA1:RSA+SHA256:ECDSA+SHA256\n"
                                             "Options = UnsafeLegacyServerConnect,UnsafeLegacyRenegotiation\n");
-  for (const Deeds &deeds : {Deeds{"shake-hands"}, Deeds{"host-loads-configuration", "shake-hands"},
-                             Deeds{"use-system-configuration", "shake-hands"}}) {
-    const std::string said = deeds.front() == "use-system-configuration" ? CONFIGURED : "";
-    SCOPED_TRACE(deeds.front());
-    EXPECT_EQ(Run(Tls12("eNULL:@SECLEVEL=0"), deeds, weak), said + REFUSED_BY_SERVER) << "no encryption";
-    EXPECT_EQ(Run(Tls12("aNULL:@SECLEVEL=0"), deeds, weak), said + REFUSED_BY_SERVER) << "no certificate";
-    EXPECT_EQ(Run(Tls12("kRSA:@SECLEVEL=0"), deeds, weak), said + REFUSED_BY_SERVER) << "no forward secrecy";
-    EXPECT_EQ(Run(Tls12("ECDHE+AESGCM:@SECLEVEL=0", "localhost-rsa1024"), deeds, weak),
-              said + "handshake: The TLS handshake with localhost failed: the server's certificate was not accepted: "
-                     "EE certificate key too weak (certificate \"CN=localhost-rsa1024\")\n");
-    EXPECT_EQ(Run(Tls12("ECDHE+AESGCM"), deeds, weak), said + DONE);
+  for (const Steps &steps : {Steps{"handshake"}, Steps{"host-loads-configuration", "handshake"},
+                             Steps{"use-system-configuration", "handshake"}}) {
+    const std::string first = steps.front() == "use-system-configuration" ? CONFIGURED : "";
+    SCOPED_TRACE(steps.front());
+    EXPECT_EQ(Run(Tls12("eNULL:@SECLEVEL=0"), steps, weak), first + REFUSED_BY_SERVER) << "no encryption";
+    EXPECT_EQ(Run(Tls12("aNULL:@SECLEVEL=0"), steps, weak), first + REFUSED_BY_SERVER) << "no certificate";
+    EXPECT_EQ(Run(Tls12("kRSA:@SECLEVEL=0"), steps, weak), first + REFUSED_BY_SERVER) << "no forward secrecy";
+    EXPECT_EQ(Run(Tls12("ECDHE+AESGCM:@SECLEVEL=0", "localhost-rsa1024"), steps, weak),
+              first + "handshake: The TLS handshake with localhost failed: the server's certificate was not accepted: "
+                      "EE certificate key too weak (certificate \"CN=localhost-rsa1024\")\n");
+    EXPECT_EQ(Run(Tls12("ECDHE+AESGCM"), steps, weak), first + DONE);
     TlsSettings old = Tls12("ALL:@SECLEVEL=0");
     old.maximumVersion = TLS1_1_VERSION;
-    EXPECT_EQ(Run(old, deeds, weak), said + UNSUPPORTED_PROTOCOL);
+    EXPECT_EQ(Run(old, steps, weak), first + UNSUPPORTED_PROTOCOL);
   }
 }
 
-TEST_F(Configuration, ThatIsStrictCountsWhenTheHostWantsIt) {
+TEST_F(Configuration, AddsRestrictionsWhenTheHostRequestsIt) {
   const auto expect = [this](const std::string &settings, const TlsSettings &server, const std::string &refusal) {
     SCOPED_TRACE(settings);
     const std::string strict = TlsConfiguration(settings);
-    EXPECT_EQ(Run(server, {"shake-hands"}, strict), DONE);
-    EXPECT_EQ(Run(server, {"host-loads-configuration", "shake-hands"}, strict), DONE);
-    EXPECT_EQ(Run(server, {"use-system-configuration", "shake-hands"}, strict), CONFIGURED + refusal);
+    EXPECT_EQ(Run(server, {"handshake"}, strict), DONE);
+    EXPECT_EQ(Run(server, {"host-loads-configuration", "handshake"}, strict), DONE);
+    EXPECT_EQ(Run(server, {"use-system-configuration", "handshake"}, strict), CONFIGURED + refusal);
   };
   expect("MinProtocol = TLSv1.3\n", Tls12("ECDHE+AESGCM"), UNSUPPORTED_PROTOCOL);
   expect("CipherString = ECDHE+CHACHA20\n", Tls12("ECDHE+AESGCM"), REFUSED_BY_SERVER);
-  expect("CipherString = kRSA\n", Tls12("ECDHE+AESGCM:kRSA"), UNSUPPORTED_PROTOCOL); // nothing that both allow
+  expect("CipherString = kRSA\n", Tls12("ECDHE+AESGCM:kRSA"), UNSUPPORTED_PROTOCOL); // no suite is allowed by both
   expect("CipherString = DEFAULT:@SECLEVEL=3\n", Tls12("ECDHE+AESGCM"),
          "handshake: The TLS handshake with localhost failed: the server's certificate was not accepted: "
          "EE certificate key too weak (certificate \"CN=localhost-rsa2048\")\n");
@@ -103,22 +104,22 @@ const std::string EVERYTHING = "verification: done\n"
                                DONE;
 
 TEST_F(Configuration, IsNotRead) {
-  // Whoever opens it waits for ever.
+  // To open this file would block for ever.
   const std::string pipe = m_folder / "openssl.cnf";
   ASSERT_EQ(mkfifo(pipe.c_str(), 0600), 0);
   EXPECT_EQ(Run(TlsSettings(), {"use-everything"}, pipe), EVERYTHING);
 }
 
-TEST_F(Configuration, ThatHasNoAlgorithmLeftChangesNothing) {
+TEST_F(Configuration, HasNoEffectWhenItAllowsNoAlgorithm) {
   const std::string none = Write("openssl_conf = init\n[init]\nalg_section = algorithms\n"
                                  "[algorithms]\ndefault_properties = provider=nobody\n");
   EXPECT_EQ(Run(TlsSettings(), {"use-everything"}, none), EVERYTHING);
   EXPECT_EQ(Run(TlsSettings(), {"host-loads-configuration", "use-everything"}, none), EVERYTHING);
 }
 
-TEST_F(Configuration, LoadsItsProvidersWhenTheHostWantsIt) {
+TEST_F(Configuration, LoadsItsProvidersWhenTheHostRequestsIt) {
   const std::string providers =
-      Write("openssl_conf = init\n[init]\nproviders = all\n[all]\ndefault = on\ntalking = module\n"
+      Write("openssl_conf = init\n[init]\nproviders = all\n[all]\ndefault = on\nreporting = module\n"
             "[on]\nactivate = 1\n[module]\nactivate = 1\nmodule = " +
             std::string(Testing::ProviderPath()) + "\n");
   EXPECT_EQ(Run(TlsSettings(), {"use-everything"}, providers), EVERYTHING);
@@ -126,26 +127,25 @@ TEST_F(Configuration, LoadsItsProvidersWhenTheHostWantsIt) {
             "provider loaded\n" + CONFIGURED + EVERYTHING);
 }
 
-TEST_F(Configuration, IsAskedForAnyNumberOfTimesOnAnyThread) {
-  EXPECT_EQ(Run(TlsSettings(),
-                {"on-many-threads", "use-system-configuration", "shake-hands", "use-system-configuration"},
+TEST_F(Configuration, CanBeRequestedAnyNumberOfTimesOnAnyThread) {
+  EXPECT_EQ(Run(TlsSettings(), {"on-many-threads", "use-system-configuration", "handshake", "use-system-configuration"},
                 TlsConfiguration("MinProtocol = TLSv1.2\n")),
             CONFIGURED + DONE + CONFIGURED);
 }
 
-TEST_F(Configuration, IsAskedForTooLateAfterTheFirstUse) {
-  EXPECT_EQ(Run(TlsSettings(), {"shake-hands", "use-system-configuration", "shake-hands"}, ""),
+TEST_F(Configuration, IsRefusedAfterTheFirstUse) {
+  EXPECT_EQ(Run(TlsSettings(), {"handshake", "use-system-configuration", "handshake"}, ""),
             DONE +
                 "configuration: InvalidStateException: The system's configuration of OpenSSL is asked for too late: "
                 "OpenSSL is in use already\n" +
                 DONE);
 }
 
-TEST_F(Configuration, ThatOpenSslRefusesIsReported) {
-  const std::string bad = Write("config_diagnostics = 1\nopenssl_conf = init\n[init]\nnothing_of_the_kind = x\n");
-  EXPECT_EQ(Run(TlsSettings(), {"shake-hands"}, bad), DONE);
-  const std::string said = Run(TlsSettings(), {"use-system-configuration"}, bad);
-  EXPECT_EQ(said.rfind("configuration: CryptoException: Cannot initialise OpenSSL: error:", 0), 0u) << said;
+TEST_F(Configuration, IsReportedWhenOpenSslRefusesIt) {
+  const std::string invalid = Write("config_diagnostics = 1\nopenssl_conf = init\n[init]\nnothing_of_the_kind = x\n");
+  EXPECT_EQ(Run(TlsSettings(), {"handshake"}, invalid), DONE);
+  const std::string output = Run(TlsSettings(), {"use-system-configuration"}, invalid);
+  EXPECT_EQ(output.rfind("configuration: CryptoException: Cannot initialise OpenSSL: error:", 0), 0u) << output;
 }
 
 } // namespace

@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
-// Static objects that join threads, or begin something, when OpenSSL has cleaned itself up already.
-#include "integration/openssl_guest/host_process.h"
+// Static objects that join threads, or start operations, after OpenSSL has cleaned itself up.
+#include "integration/openssl_host/host_process.h"
 #include "support/completion.h"
 #include "support/scripted_server.h"
 
@@ -19,8 +19,8 @@ using Testing::TlsSettings;
 
 const std::string ENDED = "OpenSSL has cleaned itself up: the process is about to end\n";
 
-/// Runs `deed` against a server that does `first`, lets the host go on and is silent then.
-std::string RunAgainstSilentServer(const char *deed, const std::function<void(ServerConnection &)> &first) {
+/// Runs `step` against a server that does `first`, lets the host continue, and is silent after that.
+std::string RunAgainstSilentServer(const char *step, const std::function<void(ServerConnection &)> &first) {
   std::promise<HostProcess *> started;
   const std::shared_future<HostProcess *> host = started.get_future().share();
   ScriptedServer server(
@@ -30,7 +30,7 @@ std::string RunAgainstSilentServer(const char *deed, const std::function<void(Se
         connection.WaitForInterrupt();
       },
       TlsSettings());
-  HostProcess process(server.GetPort(), {deed});
+  HostProcess process(server.GetPort(), {step});
   started.set_value(&process);
   return process.Finish();
 }
@@ -56,7 +56,7 @@ TEST(TheEndOfTheProcess, EndsAReadThatWaitsForTheServer) {
             "read: InvalidStateException: " + ENDED + "read again: InvalidStateException: " + ENDED);
 }
 
-TEST(TheEndOfTheProcess, RefusesWhatBeginsThen) {
+TEST(TheEndOfTheProcess, RefusesOperationsThatStartThen) {
   ScriptedServer server(
       [](ServerConnection &connection) {
         connection.Handshake();
@@ -70,7 +70,7 @@ TEST(TheEndOfTheProcess, RefusesWhatBeginsThen) {
   EXPECT_EQ(HostProcess(server.GetPort(), {"begin-at-end"}).Finish(), expected);
 }
 
-TEST(TheEndOfTheProcess, IsNoVerdictOnAToken) {
+TEST(TheEndOfTheProcess, IsNotReportedAsARefusalOfAToken) {
   EXPECT_EQ(HostProcess(0, {"verify-at-end"}).Finish(),
             "verification: done\n"
             "verification: InvalidStateException: " +

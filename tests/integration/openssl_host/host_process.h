@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// The program openssl_guest_host as a process.
+/// A process of the program openssl_host_program.
 
 #pragma once
 
@@ -12,21 +12,21 @@
 
 namespace Testing {
 
-/// Where the provider is that says so when it is loaded.
+/// The path of the provider that writes a line when it is loaded.
 const char *ProviderPath() noexcept;
 
 class HostProcess {
 public:
-  /// @param configuration the file that OPENSSL_CONF names; empty for none.
-  HostProcess(int port, const std::vector<std::string> &deeds, const std::string &configuration = {});
+  /// @param steps what the host does, in this order. @param configuration the path in OPENSSL_CONF; empty for none.
+  HostProcess(int port, const std::vector<std::string> &steps, const std::string &configuration = {});
   HostProcess(const HostProcess &) = delete;
   HostProcess &operator=(const HostProcess &) = delete;
   ~HostProcess();
 
-  /// Lets it go on where it waits for its server. On any thread.
+  /// Lets the process continue that waits for its server. May be called on any thread.
   void Continue() noexcept;
 
-  /// Waits for its end. What it wrote, and after that how it ended, unless that was well.
+  /// Waits for the process to end. Returns its output, followed by how it ended unless the exit code was 0.
   std::string Finish();
 
 private:

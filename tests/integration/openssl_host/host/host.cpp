@@ -1,5 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
-// A program that has the library in it, and does what its arguments say, one after the other.
+// A host program that performs the steps in its arguments, one after the other.
 #include "support/completion.h"
 #include "support/data_file.h"
 #include "support/outliving_thread.h"
@@ -31,7 +31,7 @@ using Tarvel::Ref;
 using Testing::DataPath;
 using Testing::ReadDataFile;
 
-// What waits for ever ends the process by a signal, before the server, whose patience is 30 seconds, ends the connection.
+// A step that waits for ever ends by a signal, before the server ends the connection, which it does after 30 seconds.
 constexpr unsigned PATIENCE_SECONDS = 20;
 
 int g_port = 0;
@@ -115,7 +115,7 @@ private:
   char m_buffer[16];
 };
 
-/// Created before OpenSSL, and so destroyed after it.
+/// Created before OpenSSL's state, so it is destroyed after that.
 class Host {
 public:
   ~Host() {
@@ -141,12 +141,13 @@ private:
 };
 Host g_host;
 
-/// The server writes to our standard input once it has what it waits for. After that the operation waits for the server.
+/// The test writes to the standard input when the server has received what it expects. From then on the operation waits
+/// for the server.
 void WaitForServer() {
   char byte = 0;
   while (read(STDIN_FILENO, &byte, 1) < 0) {
   }
-  // Twice: what the server has got may be sent by a step that has not ended, and whose end is one more step.
+  // Twice: the step that sent those bytes may not have ended, and its end starts one more step.
   Testing::DrainIoThreads();
   Testing::DrainIoThreads();
 }
@@ -223,7 +224,7 @@ void Handshake() {
   std::cout << "handshake: " << Connection(CreateTrustingContext()).Handshake() << std::endl;
 }
 
-/// One of each kind.
+/// Uses OpenSSL once in each way.
 void UseEverything() {
   const auto answer = [] { return std::string("open sesame"); };
   Report("verification", [] {
@@ -260,19 +261,19 @@ void LoadConfigurationOfHost() {
   }
 }
 
-struct Deed {
+struct Step {
   const char *name;
   void (*run)();
 };
 
-constexpr Deed DEEDS[] = {
+constexpr Step STEPS[] = {
     {"ask-service", AskService},
     {"wait-in-handshake", WaitInHandshake},
     {"wait-in-read", WaitInRead},
     {"begin-at-end", BeginAtEnd},
     {"verify-at-end", VerifyAtEnd},
     {"first-use-at-end", FirstUseAtEnd},
-    {"shake-hands", Handshake},
+    {"handshake", Handshake},
     {"use-everything", UseEverything},
     {"host-loads-configuration", LoadConfigurationOfHost},
     {"use-system-configuration", [] { Report("configuration", Tarvel::Crypto::UseSystemConfiguration); }},
@@ -285,9 +286,9 @@ int main(int argc, char **argv) {
   alarm(PATIENCE_SECONDS);
   g_port = std::atoi(argv[1]);
   for (int i = 2; i < argc; ++i) {
-    for (const Deed &deed : DEEDS) {
-      if (deed.name == std::string(argv[i])) {
-        deed.run();
+    for (const Step &step : STEPS) {
+      if (step.name == std::string(argv[i])) {
+        step.run();
       }
     }
   }

@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 
-#include "integration/openssl_guest/host_process.h"
+#include "integration/openssl_host/host_process.h"
 
 #include <array>
 #include <cstdlib>
@@ -13,17 +13,17 @@
 namespace Testing {
 
 const char *ProviderPath() noexcept {
-  return OPENSSL_GUEST_PROVIDER;
+  return OPENSSL_HOST_PROVIDER;
 }
 
-HostProcess::HostProcess(int port, const std::vector<std::string> &deeds, const std::string &configuration) {
+HostProcess::HostProcess(int port, const std::vector<std::string> &steps, const std::string &configuration) {
   std::array<int, 2> input{};
   std::array<int, 2> output{};
   if (pipe2(input.data(), O_CLOEXEC) != 0 || pipe2(output.data(), O_CLOEXEC) != 0) {
     throw std::runtime_error("no pipe");
   }
-  std::vector<std::string> words = {OPENSSL_GUEST_HOST, std::to_string(port)};
-  words.insert(words.end(), deeds.begin(), deeds.end());
+  std::vector<std::string> words = {OPENSSL_HOST_PROGRAM, std::to_string(port)};
+  words.insert(words.end(), steps.begin(), steps.end());
   std::vector<char *> arguments;
   for (std::string &word : words) {
     arguments.push_back(word.data());

@@ -1,5 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
-// Services that negotiate for real and do something else with cookies, contexts and the end than others.
+// Services that really negotiate, but handle cookies, contexts or the end in an unusual way.
 
 #include "integration/gssapi/negotiating_server.h"
 #include "integration/gssapi/negotiation_fixture.h"
@@ -31,7 +31,7 @@ std::shared_ptr<SpnegoHandler> HandlerInDceStyle() {
   return CreateSpnegoHandler(settings);
 }
 
-/// As a service does that has nothing special about it.
+/// The answer of a service that does nothing unusual.
 std::string UsualAnswer(const NegotiationLeg &leg, const std::string &context) {
   return leg.isLast ? FinalLeg(context, leg.answer, ReadDataFile("tokens/bearer.xml"))
                     : IntermediateLeg(context, leg.answer);
@@ -41,7 +41,7 @@ bool HasCookie(const NegotiationLeg &leg) {
   return leg.request.find("\r\nCookie: negotiation=7\r\n") != std::string::npos;
 }
 
-/// A service that knows its negotiations by a cookie, which it gives with that attribute.
+/// A service that identifies its negotiations by a cookie, which it sets with `attribute`.
 NegotiatingServer::Script CookieService(const std::string &attribute) {
   return [attribute](const NegotiationLeg &leg) -> NegotiationAnswer {
     if (leg.number > 1 && !HasCookie(leg)) {
@@ -51,7 +51,7 @@ NegotiatingServer::Script CookieService(const std::string &attribute) {
   };
 }
 
-TEST(BentService, GetsItsCookieBackWithTheNextLeg) {
+TEST(MisbehavingService, ReceivesItsCookieWithTheNextLeg) {
   const RealmWithAlice world;
   world.LogIn();
   const NegotiatingServer server(world.serviceKeytab, world.realm.GetFolder(), CookieService("; Path=/"));
@@ -61,7 +61,7 @@ TEST(BentService, GetsItsCookieBackWithTheNextLeg) {
   EXPECT_EQ(server.GetContexts().size(), 2u);
 }
 
-TEST(BentService, RefusesTheNextLegWhenItsCookieGetsLost) {
+TEST(MisbehavingService, RefusesTheNextLegWithoutItsCookie) {
   const RealmWithAlice world;
   world.LogIn();
   const NegotiatingServer server(world.serviceKeytab, world.realm.GetFolder(), CookieService("; Path=/elsewhere"));
@@ -70,7 +70,7 @@ TEST(BentService, RefusesTheNextLegWhenItsCookieGetsLost) {
   EXPECT_EQ(server.GetContexts().size(), 2u);
 }
 
-TEST(BentService, IsFollowedWhenItChangesTheContext) {
+TEST(MisbehavingService, MayChangeTheContext) {
   const RealmWithAlice world;
   world.LogIn();
   const NegotiatingServer server(world.serviceKeytab, world.realm.GetFolder(),
@@ -83,7 +83,7 @@ TEST(BentService, IsFollowedWhenItChangesTheContext) {
   EXPECT_EQ(server.GetContexts()[1], "context-1");
 }
 
-/// It never issues a token, and answers as if the negotiation were to go on.
+/// Never issues a token, and always answers with another leg.
 NegotiatingServer::Script EndlessService() {
   return [first = std::string()](const NegotiationLeg &leg) mutable -> NegotiationAnswer {
     if (leg.number == 1) {
@@ -93,7 +93,7 @@ NegotiatingServer::Script EndlessService() {
   };
 }
 
-TEST(BentService, IsLeftWhenItGoesOnAfterTheNegotiationsEnd) {
+TEST(MisbehavingService, EndsTheAcquisitionByALegAfterTheNegotiationsEnd) {
   const RealmWithAlice world;
   world.LogIn();
   const NegotiatingServer server(world.serviceKeytab, world.realm.GetFolder(), EndlessService());
@@ -102,7 +102,7 @@ TEST(BentService, IsLeftWhenItGoesOnAfterTheNegotiationsEnd) {
   EXPECT_EQ(server.GetContexts().size(), 2u);
 }
 
-TEST(BentService, IsLeftAtTheLimitOnLegs) {
+TEST(MisbehavingService, EndsTheAcquisitionByReachingTheLimitOnLegs) {
   const RealmWithAlice world;
   world.LogIn();
   const NegotiatingServer server(world.serviceKeytab, world.realm.GetFolder(), EndlessService());
@@ -114,7 +114,7 @@ TEST(BentService, IsLeftAtTheLimitOnLegs) {
   EXPECT_EQ(server.GetContexts().size(), 2u);
 }
 
-TEST(BentService, MayIssueTheTokenALegLater) {
+TEST(MisbehavingService, MayIssueTheTokenOneLegLater) {
   const RealmWithAlice world;
   world.LogIn();
   const NegotiatingServer server(
@@ -127,7 +127,7 @@ TEST(BentService, MayIssueTheTokenALegLater) {
   EXPECT_EQ(server.GetContexts().size(), 2u);
 }
 
-TEST(BentService, CanBeDrivenLegByLegWithoutAContext) {
+TEST(MisbehavingService, MaySendNoContextToACallerThatNegotiatesLegByLeg) {
   const RealmWithAlice world;
   world.LogIn();
   const NegotiatingServer server(world.serviceKeytab, world.realm.GetFolder(),
@@ -142,7 +142,7 @@ TEST(BentService, CanBeDrivenLegByLegWithoutAContext) {
   EXPECT_EQ(first.token, nullptr);
   const auto second = context->NegotiateToken(*handler->NegotiateLeg(*first.serverLeg));
   EXPECT_NE(second.token, nullptr);
-  // Without the service's word for the negotiation, each leg begins one, under a name of the client's.
+  // Without a context of the service, each leg begins a new negotiation, whose context the client generates.
   EXPECT_EQ(server.GetContexts()[1].rfind("urn:uuid:", 0), 0u);
 }
 

@@ -1,5 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
-// A provider of OpenSSL's that a configuration file can name. It offers nothing.
+// A provider for OpenSSL that a configuration file can load. It writes a line and offers no algorithm.
 #include <openssl/core.h>
 
 #include <cstdio>
