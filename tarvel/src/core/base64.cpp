@@ -40,7 +40,8 @@ std::uint32_t ValueOf(char c) noexcept {
   throw Base64FormatException("Base64 text: " + std::string(reason) + " at character " + std::to_string(position + 1));
 }
 
-/// Decodes groups of four characters of the alphabet, up to the first other character; returns the number of characters used.
+/// Decodes groups of four characters of the alphabet, up to the first other character; returns the number of characters
+/// used.
 std::size_t DecodeFullGroups(std::string_view text, std::uint8_t *&out) noexcept {
   std::size_t used = 0;
   while (text.size() - used >= 4) {
@@ -59,8 +60,8 @@ std::size_t DecodeFullGroups(std::string_view text, std::uint8_t *&out) noexcept
   return used;
 }
 
-/// Checks the text from its first pad on: exactly as many pads as a last group of `characters` needs, with blanks allowed
-/// between and after them, and nothing else.
+/// Checks the text from its first pad on: exactly as many pads as a last group of `characters` needs, with blanks
+/// allowed between and after them, and nothing else.
 void RequirePadding(std::string_view text, std::size_t position, int characters) {
   if (characters < 2) {
     Refuse("misplaced padding", position);
@@ -77,6 +78,23 @@ void RequirePadding(std::string_view text, std::size_t position, int characters)
     Refuse("padding cut short", position);
   }
 }
+
+/// The part that has been read of a group of four characters that blanks or the padding interrupt.
+struct PartialGroup {
+  std::uint32_t bits = 0;
+  int characters = 0;
+
+  /// Adds the value of one character. The fourth one writes the bytes of the group and starts the next.
+  void Add(std::uint32_t value, std::uint8_t *&out) noexcept {
+    bits = bits << 6 | value;
+    if (++characters == 4) {
+      *out++ = static_cast<std::uint8_t>(bits >> 16);
+      *out++ = static_cast<std::uint8_t>(bits >> 8);
+      *out++ = static_cast<std::uint8_t>(bits);
+      *this = PartialGroup();
+    }
+  }
+};
 
 /// Writes the bytes of a last group of two or three characters, whose values are `bits`.
 void DecodeLastGroup(std::uint32_t bits, int characters, std::size_t position, std::uint8_t *&out) {
@@ -131,11 +149,10 @@ std::string StringUtil::Base64Encode(const std::vector<std::uint8_t> &data) {
 std::vector<std::uint8_t> StringUtil::Base64Decode(std::string_view text) {
   std::vector<std::uint8_t> bytes(text.size() / 4 * 3);
   std::uint8_t *out = bytes.data();
-  std::uint32_t bits = 0;
-  int characters = 0; // read so far of a group that blanks or the padding interrupt
+  PartialGroup group;
   std::size_t position = 0;
   while (position < text.size()) {
-    if (characters == 0) {
+    if (group.characters == 0) {
       position += DecodeFullGroups(text.substr(position), out);
       if (position == text.size()) {
         break;
@@ -143,9 +160,9 @@ std::vector<std::uint8_t> StringUtil::Base64Decode(std::string_view text) {
     }
     const char c = text[position];
     if (c == PAD) {
-      RequirePadding(text, position, characters);
-      DecodeLastGroup(bits, characters, position, out);
-      characters = 0;
+      RequirePadding(text, position, group.characters);
+      DecodeLastGroup(group.bits, group.characters, position, out);
+      group.characters = 0;
       break;
     }
     const std::uint32_t value = ValueOf(c);
@@ -153,19 +170,11 @@ std::vector<std::uint8_t> StringUtil::Base64Decode(std::string_view text) {
       Refuse("character outside the alphabet", position);
     }
     ++position;
-    if (value == BLANK) {
-      continue;
-    }
-    bits = bits << 6 | value;
-    if (++characters == 4) {
-      *out++ = static_cast<std::uint8_t>(bits >> 16);
-      *out++ = static_cast<std::uint8_t>(bits >> 8);
-      *out++ = static_cast<std::uint8_t>(bits);
-      bits = 0;
-      characters = 0;
+    if (value != BLANK) {
+      group.Add(value, out);
     }
   }
-  if (characters != 0) {
+  if (group.characters != 0) {
     Refuse("a last group without its padding", position);
   }
   bytes.resize(static_cast<std::size_t>(out - bytes.data()));

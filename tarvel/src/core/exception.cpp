@@ -58,7 +58,8 @@ struct Exception::State {
   std::size_t count = 0;
 };
 
-// Never inlined: its return address is where the exception was made, or in the constructor of the class that derives from it.
+// Never inlined: its return address is where the exception was made, or in the constructor of the class that derives
+// from it.
 __attribute__((noinline)) Exception::Exception(const std::string &message)
     : m_state(std::make_shared<const State>(message, __builtin_return_address(0))) {}
 

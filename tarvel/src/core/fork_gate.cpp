@@ -17,8 +17,8 @@ namespace Tarvel {
 namespace {
 
 constexpr std::chrono::microseconds WAIT_STEP{50};
-/// How many steps a thread waits that forks within its own computation. Others may wait for a lock that it holds, and would
-/// never end.
+/// How many steps a thread waits that forks within its own computation. Others may wait for a lock that it holds, and
+/// would never end.
 constexpr int MAX_STEPS_WITHIN = 2000;
 
 /// The number of threads of one shard that compute: a single counter would be a point of contention.
@@ -26,8 +26,8 @@ struct alignas(SHARD_ALIGNMENT) Shard {
   std::atomic<std::uint32_t> threads{0};
 };
 
-// Constant-initialised and never destroyed. Access to `shards` and `forking` is sequentially consistent: either the thread
-// that begins sees the fork, or the fork sees the thread.
+// Constant-initialised and never destroyed. Access to `shards` and `forking` is sequentially consistent: either the
+// thread that begins sees the fork, or the fork sees the thread.
 constexpr std::size_t SHARDS = 16;
 std::array<Shard, SHARDS> shards;
 std::atomic<int> forking{0};
@@ -68,13 +68,14 @@ std::uint32_t CountComputing() noexcept {
   return threads;
 }
 
-/// 1 when the calling thread computes, and so forks within its own computation: in a signal handler, or in a module that
-/// OpenSSL has loaded. Such a child executes another program.
+/// 1 when the calling thread computes, and so forks within its own computation: in a signal handler, or in a module
+/// that OpenSSL has loaded. Such a child executes another program.
 std::uint32_t CountOwn() noexcept {
   return depth > 0 ? 1 : 0;
 }
 
-/// One fork at a time. A thread that waits for its turn does not count as computing, or the fork under way would wait for it.
+/// One fork at a time. A thread that waits for its turn does not count as computing, or the fork under way would wait
+/// for it.
 void LockForks() noexcept {
   if (depth > 0) {
     EndComputing();

@@ -10,7 +10,8 @@
 
 namespace Tarvel {
 
-// A short text is not moved by `swap` but copied, so that the source is overwritten in each case.
+// `swap` copies a short text, which is inside the string object, and leaves its bytes there: so the source is
+// overwritten.
 SecretText::SecretText(std::string &&text) noexcept {
   m_text.swap(text);
   SecureWipe(text);
@@ -25,6 +26,9 @@ SecretText &SecretText::operator=(const SecretText &other) {
 SecretText &SecretText::operator=(SecretText &&other) noexcept {
   if (this != &other) {
     SecureWipe(m_text);
+    // Without memory of its own, `m_text` exchanges no pointer for a short text, whose bytes would then be out of
+    // reach.
+    std::string().swap(m_text);
     m_text.swap(other.m_text);
     SecureWipe(other.m_text);
   }
@@ -37,6 +41,13 @@ SecretText::~SecretText() {
 
 void SecretText::Append(std::string_view text) {
   AppendWiping(m_text, text);
+}
+
+std::string SecretText::Take() noexcept {
+  std::string text;
+  text.swap(m_text);
+  SecureWipe(m_text);
+  return text;
 }
 
 } // namespace Tarvel

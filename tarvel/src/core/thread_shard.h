@@ -11,8 +11,8 @@ namespace Tarvel {
 /// Alignment at which two shards never share a cache line.
 constexpr std::size_t SHARD_ALIGNMENT = 64;
 
-/// The calling thread's shard: an index below `shards`, always the same for one thread. Consecutive threads get consecutive
-/// shards.
+/// The calling thread's shard: an index below `shards`, always the same for one thread. Consecutive threads get
+/// consecutive shards.
 std::size_t GetThreadShard(std::size_t shards) noexcept;
 
 } // namespace Tarvel

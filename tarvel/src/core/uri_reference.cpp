@@ -14,7 +14,8 @@ namespace {
 
 constexpr std::size_t NPOS = std::string_view::npos;
 
-// What a character may be part of, one bit each. A "%" has none of them: it is valid where two hexadecimal digits follow.
+// What a character may be part of, one bit each. A "%" has none of them: it is valid where two hexadecimal digits
+// follow.
 constexpr std::uint8_t ALPHA = 1U << 0U;
 constexpr std::uint8_t DIGIT = 1U << 1U;
 constexpr std::uint8_t HEX = 1U << 2U;
@@ -117,8 +118,8 @@ bool SplitAuthority(std::string_view authority, UriReference &parts) noexcept {
          ConsistsOfEscapedOr(parts.userInformation.value_or(""), USER);
 }
 
-/// Whether the path is valid. Without a scheme its first segment has no ":", which would end a scheme; after an authority
-/// that segment is empty.
+/// Whether the path is valid. Without a scheme its first segment has no ":", which would end a scheme; after an
+/// authority that segment is empty.
 bool IsPath(const UriReference &parts) noexcept {
   const std::string_view first = parts.path.substr(0, parts.path.find('/'));
   return ConsistsOfEscapedOr(parts.path, PATH) && (parts.scheme || first.find(':') == NPOS);

@@ -9,8 +9,8 @@
 
 namespace Tarvel {
 
-/// The parts of a URI reference: views of its text, in which nothing is unescaped. A missing part differs from an empty one,
-/// except for the path, which is always present.
+/// The parts of a URI reference: views of its text, in which nothing is unescaped. A missing part differs from an empty
+/// one, except for the path, which is always present.
 struct UriReference {
   std::optional<std::string_view> scheme;          ///< without the ":"
   std::optional<std::string_view> userInformation; ///< without the "@"
@@ -22,8 +22,8 @@ struct UriReference {
   std::optional<std::string_view> fragment; ///< without the "#"
 };
 
-/// Splits `text` into its parts, in linear time, without allocation. Checks everything except the content of an IP literal's
-/// brackets, so that a caller that accepts fewer addresses can refuse them with its own message.
+/// Splits `text` into its parts, in linear time, without allocation. Checks everything except the content of an IP
+/// literal's brackets, so that a caller that accepts fewer addresses can refuse them with its own message.
 /// @return `std::nullopt` when `text` is not a URI reference.
 std::optional<UriReference> SplitUriReference(std::string_view text) noexcept;
 

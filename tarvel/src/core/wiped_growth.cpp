@@ -13,8 +13,8 @@ void AppendWiping(std::string &text, std::string_view bytes) {
     std::string larger;
     larger.reserve(std::max(2 * text.capacity(), text.size() + bytes.size()));
     larger.append(text);
+    SecureWipe(text); // before `swap`, which leaves bytes of a short text in the object where nothing reaches them
     text.swap(larger);
-    SecureWipe(larger);
   }
   text.append(bytes);
 }

@@ -2,8 +2,7 @@
 
 #include <tarvel/io/reader.h>
 
-#include "core/wiped_growth.h"
-
+#include <tarvel/core/secret_text.h>
 #include <tarvel/core/secure_wipe.h>
 
 #include <array>
@@ -15,26 +14,34 @@ namespace {
 
 constexpr std::size_t CHUNK_LENGTH = 16 * 1024;
 
-/// What is read may be a response with a token in it: it is overwritten, unless it was taken.
+/// Memory for one read, which is overwritten at the end.
+struct Chunk {
+  Chunk() = default;
+  Chunk(const Chunk &) = delete;
+  Chunk &operator=(const Chunk &) = delete;
+  ~Chunk() { SecureWipe(bytes.data(), bytes.size()); }
+
+  std::array<char, CHUNK_LENGTH> bytes;
+};
+
 class StringReaderImpl final : public Reader {
 public:
   explicit StringReaderImpl(std::string &&text) noexcept : m_text(std::move(text)) {}
-  ~StringReaderImpl() override { SecureWipe(m_text); }
 
   std::size_t Read(char *buffer, std::size_t length) override {
-    const std::size_t count = m_text.copy(buffer, length, m_position);
+    const std::size_t count = m_text.Get().copy(buffer, length, m_position);
     m_position += count;
     return count;
   }
 
   std::string ReadToEnd(std::size_t) override {
-    std::string rest = std::exchange(m_text, std::string());
+    std::string rest = m_text.Take();
     rest.erase(0, std::exchange(m_position, 0));
     return rest;
   }
 
 private:
-  std::string m_text;
+  SecretText m_text; // perhaps a response with a token in it
   std::size_t m_position = 0;
 };
 
@@ -43,23 +50,16 @@ private:
 Reader::~Reader() = default;
 
 std::string Reader::ReadToEnd(std::size_t maximumBytes) {
-  std::string text;
-  std::array<char, CHUNK_LENGTH> chunk;
-  try {
-    while (text.size() <= maximumBytes) {
-      const std::size_t count = Read(chunk.data(), chunk.size());
-      if (count == 0) {
-        break;
-      }
-      AppendWiping(text, {chunk.data(), count});
+  SecretText text;
+  Chunk chunk;
+  while (text.Get().size() <= maximumBytes) {
+    const std::size_t count = Read(chunk.bytes.data(), chunk.bytes.size());
+    if (count == 0) {
+      break;
     }
-  } catch (...) {
-    SecureWipe(text);
-    SecureWipe(chunk.data(), chunk.size());
-    throw;
+    text.Append({chunk.bytes.data(), count});
   }
-  SecureWipe(chunk.data(), chunk.size());
-  return text;
+  return text.Take();
 }
 
 std::string Reader::GetDeclaredCharset() const {

@@ -14,13 +14,14 @@ namespace Tarvel::System {
 
 namespace {
 
-/// A new thread inherits the mask of the one that starts it, so that it has no moment at which a signal could hit it.
+/// Blocks signals on the calling thread. A new thread inherits the mask, so there is no moment at which a signal could
+/// reach it.
 class ScopedSignalMask {
 public:
   ScopedSignalMask() noexcept {
     sigset_t blocked;
     sigfillset(&blocked);
-    // A blocked fault would end the process without the host's crash handler being asked.
+    // If these were blocked, a fault would end the process without calling the host's crash handler.
     for (const int fault : {SIGSEGV, SIGBUS, SIGFPE, SIGILL, SIGTRAP, SIGSYS}) {
       sigdelset(&blocked, fault);
     }

@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// How the platform starts its threads: guests in the host's process, whose signals are none of their business.
+/// Starts threads with signals blocked, so that the host's handlers run on the host's threads.
 
 #pragma once
 
@@ -9,10 +9,10 @@
 
 namespace Tarvel::System {
 
-/// Starts a thread that runs `body`, which must not throw. The thread blocks every signal but those that its own faults
-/// raise, so that the host's handlers run on the host's threads.
+/// Starts a thread that runs `body`, which must not throw. The thread blocks every signal except those that its own
+/// faults raise, such as SIGSEGV.
 /// @param name shown by debuggers; at most 15 characters.
-/// @throws InvalidStateException when the system has no thread left to give.
+/// @throws InvalidStateException when the system cannot start another thread.
 std::thread StartBackgroundThread(const char *name, std::function<void()> body);
 
 } // namespace Tarvel::System

@@ -23,7 +23,7 @@ struct Fraction {
   bool isZero; ///< whether every digit is 0, also those finer than a microsecond
 };
 
-/// Reads the text from left to right and refuses the whole of it at the first thing that does not belong.
+/// Reads the text from left to right and refuses it at the first character that does not fit.
 class Scanner {
 public:
   explicit Scanner(std::string_view text) noexcept : m_text(text) {}
@@ -45,7 +45,7 @@ public:
     }
   }
 
-  /// A number of exactly so many digits.
+  /// A number of exactly `digits` digits.
   int Number(int digits, int minimum, int maximum, const char *field) {
     int value = 0;
     for (int i = 0; i < digits; ++i) {
@@ -71,7 +71,7 @@ public:
     return {microseconds, isZero};
   }
 
-  /// What may follow the time: "Z", an offset, or nothing. In minutes east of UTC.
+  /// The zone after the time: "Z", an offset, or nothing. In minutes east of UTC.
   int Zone() {
     if (AtEnd() || Skip('Z')) {
       return 0;

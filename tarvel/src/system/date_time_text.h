@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// The fields that an xsd:dateTime text is made of.
+/// The fields of an xsd:dateTime text.
 
 #pragma once
 
@@ -21,11 +21,11 @@ struct DateTimeFields {
   std::int32_t biasMinutes; ///< minutes east of UTC, -840 to 840
 };
 
-/// Takes `text` apart.
+/// Splits `text` into its fields.
 /// @throws DateTimeFormatException when it has another form, or a field is out of its range.
 DateTimeFields ParseDateTimeText(std::string_view text);
 
-/// Raises the `DateTimeFormatException` for `text`.
+/// Throws the `DateTimeFormatException` for `text`.
 [[noreturn]] void RefuseDateTimeText(std::string_view text, std::string_view reason);
 
 } // namespace Tarvel::System

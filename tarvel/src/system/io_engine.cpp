@@ -22,7 +22,7 @@ namespace Tarvel::System {
 
 namespace {
 
-/// Two, so that one long handshake does not hold up everybody else.
+/// Two, so that one long handshake does not delay everything else.
 constexpr int IO_THREADS = 2;
 
 struct Descriptors {
@@ -40,7 +40,8 @@ class IoEngine final : public ForkListener {
 public:
   /// @throws boost::system::system_error without a descriptor.
   IoEngine() {
-    // Asio opens what it waits on with the first socket or timer: here, so that no later one can fail for it.
+    // Asio opens the descriptors that it waits on with the first socket or timer: done here, so that no later one can
+    // fail for lack of them.
     const boost::asio::ip::tcp::socket socket(m_context);
     const boost::asio::steady_timer timer(m_context);
   }
@@ -53,13 +54,13 @@ public:
         StartBackgroundThread("tarvel-io", [this] { Run(); }).detach();
       }
     } catch (...) {
-      // One thread does the same work, only later; and it runs already.
+      // One thread, which runs already, does the same work, only more slowly.
     }
   }
 
   boost::asio::io_context &GetContext() noexcept { return m_context; }
 
-  // The threads leave the context once their handlers have returned. Then no lock of Asio's is held.
+  // The threads leave the context when their handlers have returned. Then no lock of Asio is held.
   void BeforeFork() noexcept override { m_context.stop(); }
   void AtFork() noexcept override { Notify(boost::asio::execution_context::fork_prepare); }
   void AfterForkInParent() noexcept override {
@@ -72,7 +73,7 @@ private:
   void Run() noexcept {
     const unsigned generation = GetForkGeneration();
     for (;;) {
-      const Computation computing; // waits while somebody forks
+      const Computation computing; // waits during a fork
       if (generation != GetForkGeneration()) {
         return; // a handler forked, and this is the thread's copy in the child
       }
@@ -88,20 +89,21 @@ private:
     try {
       m_context.notify_fork(event);
     } catch (const boost::system::system_error &) {
-      // A child without a descriptor for a context that it will not use: it misses nothing.
+      // No descriptor is left for the child's copy of the context, which the child does not use.
     }
   }
 
   boost::asio::io_context m_context{IO_THREADS};
   const boost::asio::executor_work_guard<boost::asio::io_context::executor_type> m_work{m_context.get_executor()};
-  IoEngine *m_ofParent = nullptr; // keeps what the parent's operations hold reachable; never used
+  IoEngine *m_ofParent =
+      nullptr; // never used; keeps the objects of the parent's operations reachable, so they are no leak
 };
 
 std::atomic<IoEngine *> engine{nullptr};
 IoEngine *engineOfParent = nullptr; // of the process that this one was forked from
 
-// Asio closes the child's copies of its own descriptors and makes new ones, so that what is closed afterwards does not
-// reach the parent's. The handlers that are in the context stay there: they belong to the parent.
+// Asio replaces the child's copies of its own descriptors by new ones, so that closing a socket afterwards does not
+// affect the parent's. The handlers in the context stay there: they belong to the parent.
 void IoEngine::AfterForkInChild() noexcept {
   Notify(boost::asio::execution_context::fork_child);
   Descriptors &descriptors = GetDescriptors();
@@ -130,7 +132,7 @@ IoEngine &StartEngine() {
     auto fresh = std::make_unique<IoEngine>();
     fresh->Start();
     SetForkListener(fresh.get());
-    // Never destroyed: its threads run past the end of static objects, and nobody waits for them.
+    // Never destroyed: its threads outlive static objects and are never joined.
     engine.store(fresh.get());
     return *fresh.release();
   } catch (const boost::system::system_error &error) {

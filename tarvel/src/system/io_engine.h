@@ -9,19 +9,19 @@
 
 namespace Tarvel::System {
 
-/// The context that the I/O threads run. The threads start with the first call and live as long as the process. They are
-/// shared by everything that is pending, so a handler must never block; what it throws is logged and lost. A child
-/// process made by `fork` has a context and threads of its own, which start with its own first call. Whatever is done with
-/// the context, its sockets and its timers is done within a `Computation`; its threads are in one already.
-/// @throws InvalidStateException when the first thread cannot be started, or there is no descriptor to wait with.
+/// The context that the I/O threads run. The threads start with the first call and run until the process ends. All
+/// pending operations share them, so a handler must never block; an exception that it throws is logged and ignored. A
+/// child process made by `fork` has its own context and threads, which start with its own first call. Use the context,
+/// its sockets and its timers only within a `Computation`; its own threads are in one already.
+/// @throws InvalidStateException when the first thread cannot be started, or no descriptor is left to wait with.
 boost::asio::io_context &GetIoContext();
 
-/// An object that holds a descriptor of the I/O threads, and closes it in a child of this process. The constructor and the
-/// destructor of the class that derives from it call `Enter` and `Leave`.
+/// Base of an object with a descriptor that is to be closed in a child of this process. The constructor of the derived
+/// class calls `Enter`, its destructor `Leave`.
 class ClosesInChild : public boost::intrusive::list_base_hook<> {
 public:
-  /// Closes the child's copy of the descriptor. Called in the child, once, where there is no other thread. Nothing is to
-  /// be sent, and nobody to be called.
+  /// Closes the child's copy of the descriptor. Called once in the child, where there is no other thread. Must not send
+  /// anything, nor call a handler.
   virtual void CloseInChild() noexcept = 0;
 
 protected:

@@ -35,7 +35,7 @@ struct Replacement {
 
 Replacement &GetReplacement() {
   const Computation computing;
-  static Replacement *const replacement = new Replacement; // never destroyed: lookups may outlive static objects
+  static Replacement *const replacement = new Replacement; // never destroyed: look-ups may outlive static objects
   return *replacement;
 }
 
@@ -65,8 +65,8 @@ void AppendAddress(AddressList &addresses, const sockaddr &socketAddress) {
   }
 }
 
-/// The system's error when it has no descriptor left, else 0. The resolver then says that the name is not known; the truth
-/// is in what `errno` was left at, or else in that no descriptor can be opened now.
+/// The system's error when it has no descriptor left, else 0. The resolver reports only an unknown name then. The lack
+/// shows in the value that it left in `errno`, or in that no descriptor can be opened now.
 int FindLackOfDescriptors(int errorOfResolver) noexcept {
   if (errorOfResolver == EMFILE || errorOfResolver == ENFILE) {
     return errorOfResolver;
@@ -89,7 +89,7 @@ std::string DescribeFailure(int failure, int systemError) {
 AddressList AskSystem(const std::string &host) {
   addrinfo hints{};
   hints.ai_family = AF_UNSPEC;
-  hints.ai_socktype = SOCK_STREAM; // else each address comes once for each kind of socket
+  hints.ai_socktype = SOCK_STREAM; // otherwise each address is returned once for each kind of socket
   addrinfo *found = nullptr;
   errno = 0;
   if (const int failure = getaddrinfo(host.c_str(), nullptr, &hints, &found)) {

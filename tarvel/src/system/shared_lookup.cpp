@@ -3,7 +3,7 @@
 #include "system/shared_lookup.h"
 
 #include "core/fork_gate.h"
-#include "system/endless_thread_pool.h"
+#include "system/thread_pool.h"
 
 #include <tarvel/core/string_util.h>
 #include <tarvel/system/stream.h>
@@ -43,7 +43,7 @@ struct Registry {
 
 Registry &GetRegistry() {
   const Computation computing;
-  static Registry *const registry = new Registry; // never destroyed, as nobody can end a look-up
+  static Registry *const registry = new Registry; // never destroyed: a look-up cannot be ended
   return *registry;
 }
 
@@ -92,7 +92,7 @@ public:
     m_place = place;
   }
 
-  /// From here on cancelling does nothing. Under the registry's lock.
+  /// From then on `Cancel` does nothing. Under the registry's lock.
   void ForgetPlace() noexcept { m_lookup.reset(); }
 
   /// Called once, after `ForgetPlace`.
@@ -106,19 +106,19 @@ private:
   ~Asker() override = default;
 
   LookupCompletion m_completion;
-  std::shared_ptr<Lookup> m_lookup; // guarded by the registry's mutex; null when this waits no more
+  std::shared_ptr<Lookup> m_lookup; // guarded by the registry's mutex; null when this no longer waits
   AskerList::iterator m_place;      // in m_lookup
   std::atomic<bool> m_isDone{false};
 };
 
-/// Whether anybody waits for the look-up, which is its turn to begin.
+/// Marks the look-up as begun. @return whether a caller still waits for it.
 bool Begin(Lookup &lookup) {
   const std::lock_guard<ForkSafeMutex> lock(GetRegistry().mutex);
   lookup.hasBegun = true;
   return !lookup.askers.empty();
 }
 
-/// Takes the look-up out of the registry, so that whoever asks from now on starts another one.
+/// Removes the look-up from the registry, so that later callers start another one. @return those that wait for it.
 AskerList End(Lookup &lookup) {
   Registry &registry = GetRegistry();
   const std::lock_guard<ForkSafeMutex> lock(registry.mutex);
@@ -145,7 +145,7 @@ void Run(Lookup &lookup, const std::string &host) {
   }
 }
 
-/// A new look-up for `asker`. Under the registry's lock, for which the look-up waits before it begins.
+/// Starts a look-up for `asker`. Under the registry's lock, which the look-up needs to begin.
 std::shared_ptr<Lookup> StartLookup(Registry &registry, const std::string &host, const std::string &name,
                                     const Ref<Asker> &asker) {
   auto lookup = std::make_shared<Lookup>();
@@ -161,9 +161,9 @@ std::shared_ptr<Lookup> StartLookup(Registry &registry, const std::string &host,
   return lookup;
 }
 
-/// In a child: takes out the look-ups of its parent, which nobody here will end. Under the registry's lock.
-/// @return those that wait for them, to be dropped once the lock is released; nobody will call them here.
-AskerList TakeThoseOfParent(Registry &registry) {
+/// In a child process: removes the look-ups of its parent, which never end here. Under the registry's lock.
+/// @return those that wait for them, to be destroyed after the lock is released; they are never called in this process.
+AskerList RemoveThoseOfParent(Registry &registry) {
   AskerList askers;
   if (std::exchange(registry.generation, GetForkGeneration()) == GetForkGeneration()) {
     return askers;
@@ -186,7 +186,7 @@ Ref<ScheduledItem> StartSharedLookup(const std::string &host, LookupCompletion c
   Registry &registry = GetRegistry();
   AskerList ofParent;
   const std::lock_guard<ForkSafeMutex> lock(registry.mutex);
-  ofParent = TakeThoseOfParent(registry);
+  ofParent = RemoveThoseOfParent(registry);
   const auto found = registry.lookups.find(name);
   std::shared_ptr<Lookup> lookup;
   if (found == registry.lookups.end()) {

@@ -25,7 +25,7 @@ public:
 
 private:
   const Ref<Stream> m_stream;
-  const TcpClientSocketImpl *const m_socket; // m_stream, when it is one of ours
+  const TcpClientSocketImpl *const m_socket; // m_stream, if it is a socket of this class
   std::atomic<bool> m_cancelled{false};
 };
 

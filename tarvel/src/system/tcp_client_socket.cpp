@@ -2,11 +2,11 @@
 
 #include "system/tcp_client_socket.h"
 
+#include "system/connect_target.h"
 #include "system/io_engine.h"
 #include "system/shared_lookup.h"
 
 #include <tarvel/core/exception.h>
-#include <tarvel/core/string_util.h>
 
 #include <boost/asio/buffer.hpp>
 #include <boost/asio/error.hpp>
@@ -28,48 +28,11 @@ using boost::system::error_code;
 
 namespace {
 
-constexpr int MAX_PORT = 65535;
-
-/// What a completion gets when there is no memory to say more.
+/// The failure that a completion gets when there is no memory for a message of its own.
 const NetworkException &OutOfMemory() {
   const Computation computing;
   static const NetworkException *const failure = new NetworkException("There is not enough memory"); // never destroyed
   return *failure;
-}
-
-/// Why no connection to `host` can be tried; empty when it can.
-std::string RefuseTarget(std::string_view host, int port) {
-  if (host.empty()) {
-    return "the host name is empty";
-  }
-  for (const char c : host) {
-    if (static_cast<unsigned char>(c) > 0x7E) {
-      return "the host name is not ASCII (an internationalised name must be in its \"xn--\" form)";
-    }
-    if (c <= ' ') {
-      return "the host name holds a blank or a control character";
-    }
-  }
-  if (port < 1 || port > MAX_PORT) {
-    return "the port is not between 1 and 65535";
-  }
-  return {};
-}
-
-std::string WithoutBrackets(const std::string &host) {
-  return host.size() > 2 && host.front() == '[' && host.back() == ']' ? host.substr(1, host.size() - 2) : host;
-}
-
-/// `host` as an address; unspecified, with an error, when it is a name.
-asio::ip::address ParseAddress(const std::string &host, error_code &error) {
-  return asio::ip::make_address(WithoutBrackets(host), error);
-}
-
-/// How messages name the endpoint.
-std::string DescribeTarget(const std::string &host, int port) {
-  error_code notAnAddress;
-  const bool needsBrackets = ParseAddress(host, notAnAddress).is_v6() && host.front() != '[';
-  return (needsBrackets ? "[" + host + "]" : StringUtil::Shorten(host)) + ":" + std::to_string(port);
 }
 
 template <typename Failure>
@@ -136,7 +99,7 @@ void TcpClientSocketImpl::AsyncConnect(const std::string &host, int port, Connec
   TryStep([this, &host] { StartConnect(host); });
 }
 
-/// Whatever goes wrong in a step of the connect, memory that runs out included, is how the connect ends.
+/// Runs one step of the connect; an exception, `std::bad_alloc` included, ends the connect with that failure.
 template <typename Step>
 void TcpClientSocketImpl::TryStep(const Step &step) noexcept {
   try {
@@ -155,14 +118,8 @@ void TcpClientSocketImpl::StartConnect(const std::string &host) {
     EndConnect(refusal);
     return;
   }
-  error_code notAnAddress;
-  const asio::ip::address address = ParseAddress(host, notAnAddress);
-  if (!notAnAddress) {
-    TryAddresses({address});
-    return;
-  }
-  if (WithoutBrackets(host) != host) {
-    EndConnect("only an IPv6 address may stand in brackets");
+  if (const std::optional<asio::ip::address> address = ParseAddress(host)) {
+    TryAddresses({*address});
     return;
   }
   m_lookup =
@@ -171,7 +128,7 @@ void TcpClientSocketImpl::StartConnect(const std::string &host) {
       });
 }
 
-// On a thread of the look-ups, and perhaps while the socket is being closed.
+// Runs on a thread of the look-ups, perhaps while the socket is being closed.
 void TcpClientSocketImpl::OnLookup(const AddressList &addresses, const std::exception_ptr &failure) {
   const std::lock_guard<ForkSafeMutex> lock(m_mutex);
   m_lookup.reset();
@@ -206,11 +163,11 @@ void TcpClientSocketImpl::TryNextAddress() {
   EndConnect(m_attempts);
 }
 
-// An address that swallows packets must not use up the time that the others are worth.
+// An address that drops packets must not use up the time for the others.
 void TcpClientSocketImpl::LimitAttempt() {
   m_isAttemptOverdue = false;
   if (m_nextAddress == m_addresses.size()) {
-    return; // whoever asked for the connection limits the last one
+    return; // the caller of the connection limits the last one
   }
   m_attemptTimer.expires_after(MAX_ATTEMPT_TIME);
   m_attemptTimer.async_wait([self = Ref(this), attempt = m_nextAddress](const error_code &cancelled) {
@@ -223,7 +180,8 @@ void TcpClientSocketImpl::LimitAttempt() {
   });
 }
 
-// Asio's own `open` would leave a moment in which another thread's new child process inherits the descriptor.
+// Asio's own `open` sets close-on-exec only afterwards: a child process that another thread starts in between would
+// inherit the descriptor.
 bool TcpClientSocketImpl::OpenSocket(const tcp::endpoint &endpoint, error_code &error) {
   const int descriptor = ::socket(endpoint.protocol().family(), SOCK_STREAM | SOCK_CLOEXEC, 0);
   if (descriptor < 0) {
@@ -243,7 +201,7 @@ void TcpClientSocketImpl::OnConnectAttempt(const error_code &error) {
   {
     const std::lock_guard<ForkSafeMutex> lock(m_mutex);
     if (m_stage != Stage::CONNECTING) {
-      return; // ended meanwhile, which the handler learns from `OnConnectEnd`
+      return; // has ended already, which `OnConnectEnd` reports to the handler
     }
     error_code ignored;
     m_attemptTimer.cancel(ignored);
@@ -257,7 +215,7 @@ void TcpClientSocketImpl::OnConnectAttempt(const error_code &error) {
     m_stage = Stage::CONNECTED;
     m_socket.set_option(tcp::no_delay(true), ignored); // without it the connection is slow, not wrong
     handler.swap(m_connectHandler);
-    m_connectEnd.cancel(ignored); // which finds no handler then
+    m_connectEnd.cancel(ignored); // `OnConnectEnd` finds no handler then
   }
   const HostCall call;
   handler(nullptr);

@@ -22,13 +22,13 @@
 
 namespace Tarvel::System {
 
-/// How long an address of a name may leave the connect unanswered while there are further ones to try: long enough for
-/// two repetitions of a lost packet.
+/// How long the connect waits for one address of a name while there are further ones to try: long enough for a lost
+/// packet to be sent twice more.
 constexpr std::chrono::seconds MAX_ATTEMPT_TIME{5};
 
 class TcpClientSocketImpl final : public TcpClientSocket, private ClosesInChild {
 public:
-  /// Within a computation.
+  /// Called within a computation.
   TcpClientSocketImpl();
 
   void AsyncConnect(const std::string &host, int port, ConnectHandler handler) override;
@@ -36,7 +36,7 @@ public:
   void AsyncWrite(const char *bytes, std::size_t length, TransferHandler handler) override;
   void Close() noexcept override;
 
-  /// Whether the connect has ended, well or badly, or was never started and never will be.
+  /// Whether the connect has ended, with or without success, or can no longer be started.
   bool IsConnectDone() const noexcept;
 
 private:
@@ -46,7 +46,7 @@ private:
 
   void CloseInChild() noexcept override;
 
-  // Of the connect. All but those that begin with "On" are called under the lock.
+  // The connect. All functions except those that begin with "On" are called under the lock.
   void StartConnect(const std::string &host);
   void OnLookup(const AddressList &addresses, const std::exception_ptr &failure);
   void TryAddresses(AddressList addresses);
@@ -72,23 +72,22 @@ private:
   mutable ForkSafeMutex m_mutex; // guards all that follows; never held while a handler runs
   boost::asio::ip::tcp::socket m_socket;
   Stage m_stage = Stage::FRESH;
-  bool m_isOfParent = false; // so that nobody is to be called
+  bool m_isOfParent = false; // no handler is called then
   std::string m_target;      // "host:port" or "[v6 address]:port", for messages; set once
   int m_port = 0;
 
-  // How reading and writing ended: Asio may wait for ever when it is asked again.
+  // How reading and writing ended. Kept, because Asio may wait for ever when it reads or writes again.
   boost::system::error_code m_readEnd;
   boost::system::error_code m_writeEnd;
 
   // While connecting.
   ConnectHandler m_connectHandler;
-  boost::asio::steady_timer
-      m_connectEnd; // never expires: cancelled, it calls the handler, and needs no memory for that
+  boost::asio::steady_timer m_connectEnd; // never expires; cancelling it calls the handler, which needs no memory
   std::optional<NetworkException> m_connectFailure;
   Ref<ScheduledItem> m_lookup;
   AddressList m_addresses;
   std::size_t m_nextAddress = 0;
-  std::string m_attempts; // the reasons of the failed ones
+  std::string m_attempts; // why the failed ones failed
   boost::asio::steady_timer m_attemptTimer;
   bool m_isAttemptOverdue = false;
 };

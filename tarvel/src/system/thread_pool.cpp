@@ -5,7 +5,7 @@
 #include "core/fork_gate.h"
 #include "service/uncaught_exception.h"
 #include "system/background_thread.h"
-#include "system/endless_thread_pool.h"
+#include "system/thread_pool.h"
 
 #include <tarvel/core/exception.h>
 
@@ -24,12 +24,13 @@ namespace Tarvel::System {
 namespace {
 
 constexpr std::chrono::seconds DEFAULT_IDLE_TIME{10};
-constexpr std::chrono::milliseconds MAX_IDLE_TIME = std::chrono::hours(24 * 365); // so that no addition overflows
+constexpr std::chrono::milliseconds MAX_IDLE_TIME = std::chrono::hours(24 * 365); // adding it to a time never overflows
 
 class WorkItem;
 using WorkQueue = std::list<Ref<WorkItem>>;
 
-/// Threads of a parent process. Here they can be neither joined nor let go, so nobody destroys them.
+/// Keeps the thread objects of a parent process for ever: in this process they can be neither joined nor detached, and
+/// so not be destroyed.
 void KeepThreadsOfParent(std::list<std::thread> &threads) {
   struct Kept {
     ForkSafeMutex mutex;
@@ -54,7 +55,7 @@ struct PoolState {
     }
   }
 
-  /// Whether this is the copy of a parent's state, and so without the threads that it counts.
+  /// Whether this is the copy of a parent's state. The threads that it counts do not exist in this process.
   bool IsOfParent() const noexcept { return generation != GetForkGeneration(); }
 
   const unsigned generation = GetForkGeneration();
@@ -66,7 +67,7 @@ struct PoolState {
   std::condition_variable_any changed;
   WorkQueue queue;
   std::list<std::thread> threads;
-  std::list<std::thread> retired; // ended, or about to: joined by the next to retire, or with the pool
+  std::list<std::thread> retired; // ended or about to end; joined by the next to retire, or when the pool is destroyed
   std::size_t idle = 0;
   bool ended = false;
 };
@@ -97,13 +98,13 @@ public:
   bool IsDone() const noexcept override { return m_stage == Stage::DONE || m_pool->IsOfParent(); }
 
   /// Called under the pool's lock.
-  void PutIntoQueue() { m_place = m_pool->queue.insert(m_pool->queue.end(), Ref<WorkItem>(this)); }
-  void TakeOutOfQueue() noexcept {
+  void Enqueue() { m_place = m_pool->queue.insert(m_pool->queue.end(), Ref<WorkItem>(this)); }
+  void Dequeue() noexcept {
     m_pool->queue.erase(m_place);
     m_stage = Stage::RUNNING;
   }
 
-  /// Called once, after `TakeOutOfQueue`.
+  /// Called once, after `Dequeue`.
   void Run() noexcept {
     try {
       m_work();
@@ -132,11 +133,11 @@ Ref<WorkItem> WaitForWork(PoolState &pool, std::unique_lock<ForkSafeMutex> &lock
     return {};
   }
   Ref<WorkItem> item = pool.queue.front();
-  item->TakeOutOfQueue();
+  item->Dequeue();
   return item;
 }
 
-/// Takes the calling thread off the pool's list, and joins those that retired before it.
+/// Removes the calling thread from the pool's list, and joins those that retired before it.
 void Retire(PoolState &pool, std::list<std::thread>::iterator self, std::unique_lock<ForkSafeMutex> &lock) {
   std::list<std::thread> earlier;
   if (pool.isEndless) {
@@ -201,7 +202,7 @@ public:
     const std::shared_ptr<PoolState> state = GetState();
     const Ref<WorkItem> item = MakeRef<WorkItem>(state, std::move(work));
     const std::lock_guard<ForkSafeMutex> lock(state->mutex);
-    item->PutIntoQueue();
+    item->Enqueue();
     if (state->queue.size() > state->idle && state->threads.size() < state->ceiling) {
       StartThreadFor(*item, state);
     }
@@ -225,7 +226,7 @@ private:
     std::list<std::thread> threads = m_state->IsOfParent() ? std::list<std::thread>() : EndThreads();
     CancelQueued(*m_state);
     for (std::thread &thread : threads) {
-      // A thread of the pool cannot wait for itself, nor for another that may be waiting for it.
+      // A thread of the pool cannot wait for itself, nor for another one that may wait for it.
       if (currentPool == m_state.get()) {
         thread.detach();
       } else {
@@ -234,7 +235,7 @@ private:
     }
   }
 
-  /// Has the threads end, and hands them to whoever is to wait for them.
+  /// Makes the threads end, and returns them to be joined.
   std::list<std::thread> EndThreads() noexcept {
     std::list<std::thread> threads;
     {
@@ -247,7 +248,7 @@ private:
     return threads;
   }
 
-  /// The state of this process's pool. In a child that is a new one, and what its parent had queued is dropped.
+  /// The state of this process's pool. In a child process it is a new one, and the parent's queue is dropped.
   std::shared_ptr<PoolState> GetState() {
     std::shared_ptr<PoolState> state;
     std::shared_ptr<PoolState> ofParent;
@@ -265,13 +266,14 @@ private:
     return state;
   }
 
-  /// Called under the pool's lock. Without any thread the item would wait for ever; with at least one it only waits longer.
+  /// Called under the pool's lock. Throws only when the pool has no thread at all, so that the item would wait for
+  /// ever.
   static void StartThreadFor(WorkItem &item, const std::shared_ptr<PoolState> &state) {
     try {
       AddThread(state);
     } catch (...) {
       if (state->threads.empty()) {
-        item.TakeOutOfQueue();
+        item.Dequeue();
         throw;
       }
     }
@@ -287,7 +289,7 @@ ThreadPool::~ThreadPool() = default;
 
 Ref<ThreadPool> GetThreadPool() {
   const Computation computing;
-  // Never destroyed: its threads run past the end of static objects, and nobody waits for them.
+  // Never destroyed: its threads outlive static objects and are never joined.
   static ThreadPool *const pool = CreateEndlessThreadPool(DEFAULT_THREAD_CEILING, DEFAULT_IDLE_TIME).Detach();
   return Ref<ThreadPool>(pool);
 }

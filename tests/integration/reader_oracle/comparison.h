@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// What the platform's reader and its peers make of one document, and the differences between them that are meant.
+/// Compares how the platform's reader and its peers read one document, and knows the intended differences.
 
 #pragma once
 
@@ -19,7 +19,7 @@ enum class Peer : std::uint8_t {
   EXPAT_WITH_NAMESPACES = 4 ///< with its own
 };
 
-/// One document, what we make of it and one of the peers does, which differ, and what all peers do.
+/// One document, our reading and a peer's, which differ, and the readings of all peers.
 struct Difference {
   std::string_view document;
   const Reading &ours;
@@ -28,7 +28,7 @@ struct Difference {
   const Reading &expat;
 };
 
-/// A kind of difference that is meant.
+/// A kind of intended difference.
 struct DifferenceRule {
   const char *name;
   unsigned peers; ///< a sum of `Peer`

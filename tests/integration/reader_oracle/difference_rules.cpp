@@ -36,7 +36,7 @@ bool OnlyWeRefuseAs(const Difference &difference, std::string_view beginning, st
   return OnlyWeRefuse(difference) && message.starts_with(beginning) && message.ends_with(end);
 }
 
-/// The document from where we refuse it.
+/// The rest of the document from the place where we refuse it.
 std::string_view FromOurPosition(const Difference &difference) {
   const Reading &ours = difference.ours;
   const std::size_t offset = OffsetOf(difference.document, ours.line, ours.column);
@@ -152,7 +152,7 @@ bool IsUnboundPrefix(const Difference &difference) {
          difference.expat.hasUnboundPrefix && (difference.libxml2.hasUnboundPrefix || !difference.libxml2.isAccepted);
 }
 
-/// What a message has between its first quotation mark and its last.
+/// The part of a message between its first quotation mark and its last.
 std::string_view QuotedIn(std::string_view message) {
   const std::size_t begin = message.find('\'') + 1;
   return message.substr(begin, message.rfind('\'') - begin);

@@ -17,7 +17,7 @@ namespace {
 
 constexpr std::string_view XML_NAMESPACE = "http://www.w3.org/XML/1998/namespace";
 constexpr std::string_view XMLNS_NAMESPACE = "http://www.w3.org/2000/xmlns/";
-constexpr char SEPARATOR = '\n'; // no namespace name holds one: white space of attribute values is made blanks
+constexpr char SEPARATOR = '\n'; // not in a namespace name: white space in attribute values becomes blanks
 
 struct ParserDeleter {
   void operator()(XML_ParserStruct *parser) const noexcept { XML_ParserFree(parser); }
@@ -37,9 +37,9 @@ std::string_view LocalNameOf(std::string_view name) {
   return name.substr(name.find(':') + 1);
 }
 
-/// Whether `part`, of a name that is one of XML, is a name without a colon. A name of XML may begin with neither a digit nor
-/// another of the characters that only continue a name; its part after a colon may. expat knows those of the fourth edition
-/// beyond ASCII, and these few have the same place in both editions.
+/// Whether `part`, a part of a valid XML name, is a name without a colon. The whole name begins with a character that
+/// may begin a name; the part after a colon may begin with one that only continues a name. Beyond ASCII expat has these
+/// characters from the fourth edition; the few that are tested here are the same in both editions.
 bool IsColonless(std::string_view part) {
   if (part.empty() || part.find(':') != std::string_view::npos) {
     return false;
@@ -54,7 +54,7 @@ bool IsColonless(std::string_view part) {
   return !isMiddleDot && !isCombining && !isTie;
 }
 
-/// Namespaces in XML 1.0, as far as it can be judged without knowing what a URI is.
+/// Checks Namespaces in XML 1.0, except whether a namespace name is a URI.
 class NamespaceRules {
 public:
   const std::string &GetFault() const { return m_fault; }
@@ -155,7 +155,7 @@ struct Session {
   XML_Parser parser;
   Reading reading;
   NamespaceRules rules;                  // where expat does not judge namespaces
-  std::vector<Declaration> declarations; // of the element that begins, where expat does
+  std::vector<Declaration> declarations; // of the element that begins, with expat's namespaces
 
   EventText &Events() { return reading.declarationsFirst; }
 };
@@ -168,7 +168,8 @@ std::string_view ToView(const char *text) {
   return text ? std::string_view(text) : std::string_view();
 }
 
-/// Feeds `document` to a parser that has its handlers for elements, and sets the others. `EVENTS` is the reading's text.
+/// Feeds `document` to a parser that has its handlers for elements, and sets the others. `EVENTS` is the reading's
+/// text.
 template <EventText Reading::*EVENTS>
 void Run(Session &session, std::string_view document) {
   const XML_Parser parser = session.parser;

@@ -68,7 +68,7 @@ private:
     return *(numbers.begin() + m_random.Below(numbers.size()));
   }
 
-  /// Whether something is written here that most likely is wrong.
+  /// Whether to write something that is probably wrong here.
   bool IsOdd() { return m_oddity != 0 && m_random.OnceIn(m_oddity); }
 
   template <std::size_t COUNT>
@@ -170,7 +170,7 @@ private:
     if (IsOdd()) {
       PutCharacter();
     }
-    if (m_oddity == 0 || !m_random.OnceIn(m_oddity)) { // what is not odd must not have two hyphens
+    if (m_oddity == 0 || !m_random.OnceIn(m_oddity)) { // a comment that is not odd must not have two hyphens
       RemoveRuns(begin);
     }
     Put(IsOdd() ? "--" : "-->");
@@ -280,7 +280,7 @@ private:
     }
   }
 
-  /// Adds an attribute; one whose name is there already only now and then.
+  /// Adds an attribute; only rarely one whose name exists already.
   bool Add(const std::string &name, std::string_view value, std::vector<WrittenAttribute> &attributes) {
     const bool isTwice = std::any_of(attributes.begin(), attributes.end(),
                                      [&](const WrittenAttribute &other) { return other.name == name; });
@@ -349,7 +349,7 @@ private:
   }
 
   RandomSource &m_random;
-  const std::size_t m_oddity; // one in so many things is odd; 0: none
+  const std::size_t m_oddity; // one in this many pieces is odd; 0: none
   const bool m_isNarrow;      // few prefixes, namespaces and names, so that they meet
   std::size_t m_elements = 0;
   std::vector<std::string> m_declared; // prefixes in scope

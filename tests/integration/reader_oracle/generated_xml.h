@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// Documents made up from a seed for comparing readers: many are well-formed, most of the others nearly so.
+/// Documents generated from a seed, to compare readers with: many are well-formed, most of the others nearly.
 
 #pragma once
 
@@ -9,7 +9,7 @@
 
 namespace Testing {
 
-/// The same text for the same seed on every machine; at most some KiB, mostly far below.
+/// The same text for the same seed on every machine; at most a few KiB, mostly much less.
 std::string GenerateXml(std::uint64_t seed);
 
 } // namespace Testing

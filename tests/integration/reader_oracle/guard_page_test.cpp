@@ -1,5 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
-// Documents between pages that may not be read: an octet too far ends the test.
+// Documents next to pages that cannot be read: reading one octet too far ends the test.
 
 #include "comparison.h"
 #include "generated_xml.h"
@@ -23,7 +23,7 @@ namespace {
 using Testing::Escaped;
 using Testing::Reading;
 
-/// Pages that can be written, between two that can be neither read nor written.
+/// Writable pages between two pages that can be neither read nor written.
 class GuardedPages {
 public:
   explicit GuardedPages(std::size_t bytes)
@@ -63,7 +63,7 @@ void ExpectSameReading(const Reading &reading, const Reading &expected, std::str
   ASSERT_EQ(reading.events.Get(), expected.events.Get()) << Escaped(document);
 }
 
-/// The reader makes of `document` next to each of the pages what it makes of it elsewhere.
+/// Expects the same reading of `document` next to each of the pages as elsewhere.
 void ExpectReadWithin(GuardedPages &pages, std::string_view document) {
   const Reading elsewhere = Testing::ReadWithPlatform(document);
   ExpectSameReading(Testing::ReadInPlace(pages.PutAtBegin(document)), elsewhere, document);
@@ -72,7 +72,7 @@ void ExpectReadWithin(GuardedPages &pages, std::string_view document) {
 
 constexpr std::size_t MOST_BYTES = 64 * 1024;
 
-TEST(DocumentBetweenGuardPages, IsReadAsElsewhereWhateverItIs) {
+TEST(DocumentBetweenGuardPages, IsReadAsElsewhere) {
   const std::size_t documents = Testing::Repetitions<std::size_t>(1'000'000, 20'000);
   GuardedPages pages(MOST_BYTES);
   for (std::uint64_t seed = 0; seed < documents; ++seed) {
@@ -82,7 +82,7 @@ TEST(DocumentBetweenGuardPages, IsReadAsElsewhereWhateverItIs) {
   }
 }
 
-TEST(DocumentBetweenGuardPages, IsReadAsElsewhereWhereverItIsCutOff) {
+TEST(DocumentBetweenGuardPages, IsReadAsElsewhereAfterAnyCut) {
   GuardedPages pages(MOST_BYTES);
   for (const std::string &document :
        {Testing::ReadDataFile("tokens/bearer-5k.xml"),

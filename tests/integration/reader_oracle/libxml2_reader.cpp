@@ -96,7 +96,7 @@ using ParserHandle = std::unique_ptr<xmlParserCtxt, decltype(&xmlFreeParserCtxt)
 
 ParserHandle MakeParser() {
   xmlInitParser();
-  // What belongs to no parser, such as that a text cannot be recoded, would be printed.
+  // An error outside a parser, such as text that cannot be recoded, would be printed otherwise.
   xmlSetStructuredErrorFunc(nullptr, [](void *, xmlErrorPtr) {});
   ParserHandle parser(xmlNewParserCtxt(), &xmlFreeParserCtxt);
   xmlSAXHandler table{};

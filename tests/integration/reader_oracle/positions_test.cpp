@@ -1,5 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
-// Where generated documents are refused: the first octet that cannot be there, or the beginning of what is wrong as a whole.
+// Where generated documents are refused: at the first invalid octet, or at the beginning of a construct that is wrong
+// as a whole.
 
 #include "comparison.h"
 #include "generated_xml.h"
@@ -33,7 +34,7 @@ bool Is(const Reading &reading, std::string_view beginning, std::string_view end
   return std::string_view(reading.message).starts_with(beginning) && std::string_view(reading.message).ends_with(end);
 }
 
-/// What libxml2 accepts and goes on from, until it refuses something else.
+/// Faults that libxml2 accepts; it reads on until it refuses something else.
 bool IsAcceptedByLibxml2(const Reading &ours, const Reading &) {
   return Is(ours, "the XML version '", "' is not 1.0") ||
          Is(ours, "the encoding '", "' is declared, only UTF-8 is accepted") ||
@@ -48,21 +49,21 @@ bool IsOfNamespaces(const Reading &theirs) {
          theirs.code == XML_WAR_NS_URI || theirs.code == XML_ERR_ATTRIBUTE_REDEFINED;
 }
 
-/// An attribute or a declaration that is wrong as a whole: libxml2 says so where it ends, or where the tag does.
+/// An attribute or a declaration that is wrong as a whole: libxml2 reports it at its end, or at the end of the tag.
 bool IsWrongAttribute(const Reading &ours, const Reading &theirs) {
   return IsOfNamespaces(theirs) && (Is(ours, "the attribute '", "' occurs twice") ||
                                     Is(ours, "the attributes '", "' have the same local name in the same namespace") ||
                                     Is(ours, "the prefix '") || Is(ours, "the namespace of the prefix '"));
 }
 
-/// An end tag that has no name or another one: libxml2 looks on to its ">", and past white space.
+/// An end tag without a name or with another one: libxml2 reads on to its ">", and past white space.
 bool IsWrongEndTag(const Reading &ours, const Reading &theirs) {
   return (theirs.code == XML_ERR_GT_REQUIRED || theirs.code == XML_ERR_TAG_NAME_MISMATCH) &&
          (Is(ours, "the element '", " has another end tag") || Is(ours, "'</' is not followed by a name") ||
           Is(ours, "a name has a colon that is not between a prefix and a local name"));
 }
 
-/// Where it begins; libxml2 looks into it.
+/// We refuse it where it begins; libxml2 within it.
 bool IsDocumentType(const Reading &ours, const Reading &) {
   return Is(ours, "a document type declaration is not accepted");
 }
@@ -77,7 +78,7 @@ constexpr LineRule WE_ARE_EARLIER[] = {{"libxml2 accepts that and refuses someth
                                        {"an end tag is reported where it begins", IsWrongEndTag},
                                        {"a document type declaration is reported where it begins", IsDocumentType}};
 
-/// libxml2 judges declarations one by one before it has read the tag, and refuses some namespace names that we accept.
+/// libxml2 checks declarations one by one before it has read the tag, and refuses some namespace names that we accept.
 bool IsJudgedBeforeTheTagIsRead(const Reading &, const Reading &theirs) {
   return IsOfNamespaces(theirs);
 }
@@ -134,7 +135,7 @@ private:
   std::vector<std::size_t> m_later;
 };
 
-TEST(PositionOfRefusal, IsOnTheLineThatLibxml2ReportsButForNamedDifferences) {
+TEST(PositionOfRefusal, IsOnTheLineThatLibxml2ReportsExceptForNamedDifferences) {
   LineComparison lines;
   std::size_t findings = 0;
   for (std::uint64_t seed = 0; seed < DOCUMENTS; ++seed) {

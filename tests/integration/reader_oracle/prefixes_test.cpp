@@ -18,7 +18,8 @@
 
 namespace {
 
-// Of documents longer than the first number, the everyday run reads only prefixes whose length the second one divides.
+// Of documents longer than the first number, a normal run reads only prefixes whose length is a multiple of the second
+// one.
 constexpr std::size_t LARGE = 20'000;
 constexpr std::size_t LARGE_STEP = 211;
 
@@ -35,15 +36,15 @@ std::vector<std::string> AllDocuments() {
   return documents;
 }
 
-/// Whether a prefix of that length ends at "<" or ">", or is one of those in between that are taken all the same.
+/// Whether a prefix of that length ends at "<" or ">", or is one of the others that a normal run reads too.
 bool IsNearBoundary(std::string_view text, std::size_t length) {
   constexpr std::size_t STEP = 251;
   const std::size_t begin = length == 0 ? 0 : length - 1;
   return text.substr(begin, 2).find_first_of("<>") != std::string_view::npos || length % STEP == 0;
 }
 
-TEST(PrefixesOfDocuments, AreReadByAllReadersAlike) {
-  const bool isFull = Testing::Repetitions(true, false); // otherwise those at boundaries of markup, and some
+TEST(PrefixesOfDocuments, AreReadAlikeByAllReaders) {
+  const bool isFull = Testing::Repetitions(true, false); // otherwise those at boundaries of markup, and some others
   std::string former;
   std::size_t accepted = 0;
   for (const std::string &document : AllDocuments()) {
@@ -59,7 +60,7 @@ TEST(PrefixesOfDocuments, AreReadByAllReadersAlike) {
     }
     former = document;
   }
-  EXPECT_GT(accepted, 100u); // those whole, and without the line break at the end
+  EXPECT_GT(accepted, 100u); // whole documents, with and without the line break at the end
 }
 
 } // namespace

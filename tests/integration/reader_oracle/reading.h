@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// `Reading`, what a reader makes of a document, in a form in which readers are compared.
+/// `Reading`, the result of reading a document, in a form in which readers are compared.
 
 #pragma once
 
@@ -12,8 +12,8 @@
 
 namespace Testing {
 
-/// Events as text. Each begins with an octet that no document that is accepted may hold, so that none can pass for another.
-/// Text that is reported in pieces is one event.
+/// Events as text. Each begins with an octet that an accepted document cannot contain, so that events cannot be
+/// confused. Text that is reported in pieces is one event.
 class EventText {
 public:
   void StartElement(std::string_view name) { Add('\x01', name); }
@@ -36,7 +36,7 @@ struct Reading {
   bool isAccepted = false;
   bool hasDocumentType = false;  ///< peers only: they stop there, and what is after it is not judged
   bool hasUnboundPrefix = false; ///< peers only
-  EventText events; ///< attributes and declarations in the order of the document; not from peers that part them
+  EventText events; ///< attributes and declarations in the order of the document; not from peers that separate them
   EventText declarationsFirst;      ///< the declarations of an element before its attributes; without that of "xml"
   std::vector<std::size_t> offsets; ///< where the elements begin; ours and expat's without namespaces
   int code = 0;                     ///< peers only: the number of the first error
@@ -48,8 +48,8 @@ struct Reading {
   static constexpr std::size_t NO_OFFSET = static_cast<std::size_t>(-1);
 };
 
-/// The offset in `document` of line and column as we count them: lines end with LF, columns are octets from 1, and a byte
-/// order mark has none. More than the document's size when there is no such line.
+/// The offset in `document` of line and column as we count them: lines end with LF, columns are octets from 1, and a
+/// byte order mark has none. More than the document's size when there is no such line.
 std::size_t OffsetOf(std::string_view document, std::uint32_t line, std::uint32_t column);
 
 /// Whether a name as written is "xmlns" or begins with "xmlns:".

@@ -1,5 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
-// The generated documents reach all of the reader: each reason to refuse one is met.
+// The generated documents reach all of the reader: each reason for a refusal occurs.
 
 #include "generated_xml.h"
 #include "readers.h"

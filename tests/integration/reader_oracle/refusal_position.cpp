@@ -12,7 +12,7 @@ namespace {
 
 /// Whether a document that ends just before the place of that refusal may be refused elsewhere.
 bool IsJudgedBefore(const Reading &refusal, const Reading &before) {
-  // The first four octets are judged before all others.
+  // The first four octets are checked before all others.
   if (refusal.message == "the document is UTF-16 or UTF-32, or begins with a null byte; only UTF-8 is accepted") {
     return true;
   }

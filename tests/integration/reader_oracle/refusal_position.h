@@ -11,9 +11,9 @@
 
 namespace Testing {
 
-/// What is wrong with the position of our refusal of `document`; empty when nothing is. It is within a line of the document
-/// or at the end of one, and the text before it is one that a well-formed document may begin with: cut off there, the
-/// document is accepted, or refused for its end.
+/// The fault in the position of our refusal of `document`; empty when the position is right. A right position is within
+/// a line of the document or at the end of one, and a well-formed document may begin with the text before it: cut off
+/// there, the document is accepted, or refused for its end.
 std::string DescribeWrongPosition(std::string_view document, const Reading &refusal);
 
 } // namespace Testing

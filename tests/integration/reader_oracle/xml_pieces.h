@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// What generated documents are put together from: what is right at its place, and what is odd there.
+/// The pieces of generated documents: valid ones for each place, and odd ones.
 
 #pragma once
 
@@ -11,7 +11,8 @@ namespace Testing {
 
 using namespace std::string_view_literals;
 
-// The places at which ranges of NameStartChar, NameChar (XML 1.0, productions 4 and 4a) and Char (production 2) begin and end.
+// The places at which ranges of NameStartChar, NameChar (XML 1.0, productions 4 and 4a) and Char (production 2) begin
+// and end.
 inline constexpr std::uint32_t NAME_BOUNDARIES[] = {
     0x2D,   0x2E,   0x30,   0x39,   0x3A,   0x41,   0x5A,   0x5F,   0x61,   0x7A,   0xB7,   0xC0,    0xD6,
     0xD8,   0xF6,   0xF8,   0x2FF,  0x300,  0x36F,  0x370,  0x37D,  0x37F,  0x1FFF, 0x200C, 0x200D,  0x203F,

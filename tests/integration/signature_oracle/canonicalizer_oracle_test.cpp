@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
-// Each algorithm on generated documents, whole and in part, beside libxml2's C14N and beside forms written from expat's
-// events, which have libxml2's parser on neither side.
+// Each algorithm on generated documents, whole and in part, compared with libxml2's C14N and with forms written from
+// expat's events. The second comparison does not use libxml2's parser at all.
 
 #include "expat_oracle.h"
 #include "generated_document.h"
@@ -108,7 +108,7 @@ std::string Describe(const Form &form, const std::string &text) {
 
 class CanonicalizerOracle : public ::testing::TestWithParam<Algorithm> {};
 
-TEST_P(CanonicalizerOracle, WritesWhatLibxml2WritesForGeneratedDocuments) {
+TEST_P(CanonicalizerOracle, AgreesWithLibxml2OnGeneratedDocuments) {
   Testing::RandomSource random(GetParam().seed);
   std::size_t parts = 0;
   for (std::size_t count = 0; count < DOCUMENTS; ++count) {
@@ -127,7 +127,7 @@ TEST_P(CanonicalizerOracle, WritesWhatLibxml2WritesForGeneratedDocuments) {
   EXPECT_GT(parts, DOCUMENTS / 4);
 }
 
-TEST_P(CanonicalizerOracle, WritesWhatExpatsEventsGiveForGeneratedDocuments) {
+TEST_P(CanonicalizerOracle, AgreesWithExpatsEventsOnGeneratedDocuments) {
   Testing::RandomSource random(GetParam().seed + 100);
   std::size_t lengthy = 0;
   for (std::size_t count = 0; count < DOCUMENTS; ++count) {

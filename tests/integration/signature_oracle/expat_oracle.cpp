@@ -1,5 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
-// Written to be compared with: it keeps whole maps where the library keeps tables, and has no limit and no buffer.
+// Written for comparison: it uses whole maps where the library uses tables, and has no limits and no buffers.
 
 #include "expat_oracle.h"
 
@@ -109,7 +109,7 @@ private:
     }
     element.inScope["xml"] = XML_NAMESPACE;
     if (IsWritten()) {
-      // The inclusive form of an apex takes over the xml: attributes of what is left out above it, the nearest first.
+      // The inclusive form of an apex includes the xml: attributes of its omitted ancestors, the nearest first.
       if (!m_method.isExclusive && m_withinApex == 1) {
         for (auto above = m_open.rbegin(); above != m_open.rend(); ++above) {
           for (const Attribute &inherited : above->xmlAttributes) {
@@ -210,7 +210,8 @@ private:
     if (!m_open.empty()) {
       m_output += IsWritten() ? node : std::string();
     } else if (m_apex == NO_ELEMENT) {
-      // Where the document element is left out, the recommendation does not say what is before it; libxml2 takes all.
+      // If the document element is omitted, the recommendation does not define what is before it; libxml2 writes
+      // everything.
       m_output += m_isRootWritten ? "\n" + node : node + "\n";
     }
   }
@@ -221,7 +222,7 @@ private:
   std::vector<OpenElement> m_open;
   std::size_t m_elements = 0;
   std::size_t m_withinApex = 0;    // how many open elements are within it
-  std::size_t m_withinOmitted = 0; // likewise
+  std::size_t m_withinOmitted = 0; // the same for the omitted subtree
   bool m_isRootWritten = false;
   bool m_hasUnboundPrefix = false;
   std::string m_output;

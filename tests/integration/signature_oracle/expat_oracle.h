@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// Canonical forms written from the events of expat: a parser that shares nothing with libxml2's or with our own.
+/// Canonical forms written from the events of expat, a parser that shares no code with libxml2's or with ours.
 
 #pragma once
 
@@ -20,9 +20,10 @@ struct ExpatMethod {
 
 constexpr std::size_t NO_ELEMENT = static_cast<std::size_t>(-1);
 
-/// The canonical form (Canonical XML 1.0 or Exclusive XML Canonicalization 1.0) of the subtree at the element number `apex`
-/// (`NO_ELEMENT`: of the whole document) without the subtree at the element number `omitted` (`NO_ELEMENT`: with all).
-/// Elements are counted from 0 in document order. Nothing when expat refuses the document or a prefix is not bound.
+/// The canonical form (Canonical XML 1.0 or Exclusive XML Canonicalization 1.0) of the subtree at the element number
+/// `apex` (`NO_ELEMENT`: of the whole document) without the subtree at the element number `omitted` (`NO_ELEMENT`: with
+/// all). Elements are counted from 0 in document order. Nothing when expat refuses the document or a prefix is not
+/// bound.
 std::optional<std::string> CanonicalFormByExpat(std::string_view text, std::size_t apex, std::size_t omitted,
                                                 const ExpatMethod &method);
 

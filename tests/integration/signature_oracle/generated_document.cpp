@@ -21,7 +21,8 @@ constexpr std::size_t SPREAD_OF_MANY_PREFIXES = 150;
 constexpr std::string_view PREFIXES[] = {"a", "b", "n0", "_", "x-1.y", "\xC3\xA9", "A", "aa"};
 constexpr std::string_view NAMESPACES[] = {"urn:a",      "urn:b", "http://example.com/?a=1;b='2'",
                                            "urn:%C3%BC", "URN:A", "urn:a:b"};
-// libxml2 parses only namespace names that are URIs, and writes them without the escapes that the recommendation wants.
+// libxml2 parses only namespace names that are URIs, and writes them without the escapes that the recommendation
+// requires.
 constexpr std::string_view ODD_NAMESPACES[] = {"urn:a?b&amp;c", "urn:&#38;", "http://example.com/?a=&amp;lt;"};
 constexpr std::string_view LOCAL_NAMES[] = {"a", "b", "item", "B", "z.9", "_x", "\xD0\xB6"};
 constexpr std::string_view TEXT_PIECES[] = {"text",         " ",

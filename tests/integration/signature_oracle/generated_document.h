@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// Documents made up from a seed, full of what canonicalisation has rules for.
+/// Documents generated from a seed, with many of the constructs for which canonicalisation has rules.
 
 #pragma once
 
@@ -13,9 +13,10 @@
 
 namespace Testing {
 
-/// A well-formed document without a document type declaration: namespaces declared, declared again and undeclared, default
-/// namespaces, xml: attributes, CDATA sections, comments, processing instructions, references, carriage returns, characters
-/// of all lengths; some have texts of more than 4096 octets, and some more prefixes than 16 in scope. Each element has an attribute ID: "e0" for the document element, then "e1" and so on in document order.
+/// A well-formed document without a document type declaration: namespaces declared, declared again and undeclared,
+/// default namespaces, xml: attributes, CDATA sections, comments, processing instructions, references, carriage
+/// returns, characters of all lengths; some have texts of more than 4096 octets, and some more prefixes than 16 in
+/// scope. Each element has an attribute ID: "e0" for the document element, then "e1" and so on in document order.
 struct GeneratedDocument {
   std::string text;
   std::size_t elements = 0;
@@ -29,7 +30,7 @@ enum class NamespaceNames {
 
 GeneratedDocument GenerateDocument(RandomSource &random, NamespaceNames names = NamespaceNames::PLAIN);
 
-/// Prefixes that the documents declare, some never declared among them, and "#default": for InclusiveNamespaces.
+/// Prefixes for InclusiveNamespaces: some that the documents declare, some that they never declare, and "#default".
 std::vector<std::string> GeneratePrefixList(RandomSource &random);
 
 } // namespace Testing

@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// libxml2's parser and its C14N, as the other opinion on canonical forms.
+/// libxml2's parser and its C14N, to compare canonical forms with.
 
 #pragma once
 
@@ -19,7 +19,7 @@ struct XmlDocDeleter {
 };
 using XmlDocHandle = std::unique_ptr<xmlDoc, XmlDocDeleter>;
 
-/// A text as libxml2 wants it.
+/// A text in libxml2's type.
 inline const xmlChar *XmlText(const char *text) noexcept {
   return reinterpret_cast<const xmlChar *>(text);
 }
@@ -33,8 +33,8 @@ xmlNode *ElementOfLibxml2(xmlDoc &document, std::size_t index);
 /// The first element of that local name in document order, or null.
 xmlNode *ElementOfLibxml2(xmlDoc &document, std::string_view localName);
 
-/// Whether a namespace is declared anywhere whose name has no scheme. libxml2 then canonicalises no part of the document, be
-/// the declaration in that part or not.
+/// Whether a namespace is declared anywhere whose name has no scheme. libxml2 then canonicalises no part of the
+/// document, whether or not the declaration is in that part.
 bool HasRelativeNamespaceName(xmlDoc &document);
 
 struct OracleMethod {
@@ -43,7 +43,8 @@ struct OracleMethod {
   std::vector<std::string> inclusivePrefixes;
 };
 
-/// The canonical form of the subtree at `apex` (null: of the whole document) without the subtree at `omitted` (may be null).
+/// The canonical form of the subtree at `apex` (null: of the whole document) without the subtree at `omitted` (may be
+/// null).
 /// @throws std::runtime_error when libxml2 refuses.
 std::string CanonicalFormOfLibxml2(xmlDoc &document, const xmlNode *apex, const xmlNode *omitted,
                                    const OracleMethod &method);

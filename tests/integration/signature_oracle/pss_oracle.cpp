@@ -30,7 +30,7 @@ std::string AttributeOf(xmlNode *node, const char *name) {
   return copy;
 }
 
-/// The text of an element, white space left out.
+/// The text of an element without white space.
 std::string TextOf(xmlNode *node) {
   xmlChar *const content = xmlNodeGetContent(node);
   std::string text = content ? reinterpret_cast<const char *>(content) : "";
@@ -40,7 +40,7 @@ std::string TextOf(xmlNode *node) {
   return text;
 }
 
-/// The canonical form of `SignedInfo` by the method that it names, if that is one.
+/// The canonical form of `SignedInfo` by its own method, if that is a known one.
 std::optional<std::string> CanonicalSignedInfo(xmlDoc &document) {
   xmlNode *const method = ElementOfLibxml2(document, "CanonicalizationMethod");
   const std::string uri = AttributeOf(method, "Algorithm");
@@ -97,7 +97,7 @@ PssOracle::PssOracle(const std::string &digest, std::string signatureUri, const 
   }
 }
 
-/// A copy in which the xmlsec1 library has put the digests as they should be; null when it cannot.
+/// A copy into which the xmlsec1 library has written the right digests; null when it cannot.
 XmlDocHandle PssOracle::WithFreshDigests(const xmlDoc &document) const {
   XmlDocHandle copy(xmlCopyDoc(const_cast<xmlDoc *>(&document), 1));
   xmlNode *const method = ElementOfLibxml2(*copy, "SignatureMethod");
@@ -158,7 +158,7 @@ bool PssOracle::Verifies(const xmlDoc &document) const {
   EVP_PKEY_CTX *keyContext = nullptr;
   EVP_DigestVerifyInit(context.get(), &keyContext, m_digest, nullptr, m_key.get());
   SetPssPadding(keyContext);
-  // The decoder counts padding as bytes; the size of the key says how many there are.
+  // The decoder counts padding as bytes; the size of the key gives the real number.
   return EVP_DigestVerify(context.get(), value.data(), static_cast<std::size_t>(EVP_PKEY_get_size(m_key.get())),
                           Bytes(*canonical), canonical->size()) == 1;
 }

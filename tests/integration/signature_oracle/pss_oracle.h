@@ -1,7 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// RSA-PSS, which the xmlsec1 library of this time does not know: its digests, libxml2's canonical form of `SignedInfo`, and
-/// OpenSSL's signature together.
+/// RSA-PSS, which this version of the xmlsec1 library does not have: made of its digests, libxml2's canonical form of
+/// `SignedInfo`, and OpenSSL's signature.
 
 #pragma once
 
@@ -16,8 +16,8 @@ namespace Testing {
 
 class PssOracle {
 public:
-  /// @param digest of OpenSSL, as "SHA256". @param signatureUri the algorithm's URI.
-  /// @param rsaKeyPath the PEM file with the signer's key. @param helperKeyPath one with an EC key, to have digests made.
+  /// @param digest its name in OpenSSL, such as "SHA256". @param signatureUri the algorithm's URI.
+  /// @param rsaKeyPath the PEM file with the signer's key. @param helperKeyPath one with an EC key, for making digests.
   PssOracle(const std::string &digest, std::string signatureUri, const std::string &rsaKeyPath,
             const std::string &helperKeyPath);
 

@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// `RandomSource`, choices that come out the same on every machine.
+/// `RandomSource`, random choices that are the same on every machine.
 
 #pragma once
 
@@ -15,7 +15,8 @@ class RandomSource {
 public:
   explicit RandomSource(std::uint64_t seed) : m_engine(seed) {}
 
-  /// A number below `bound`, which must not be 0. The standard distributions differ between libraries, this does not.
+  /// A number below `bound`, which must not be 0. Unlike the standard distributions, it is the same in
+  /// every library.
   std::size_t Below(std::size_t bound) { return static_cast<std::size_t>(m_engine() % bound); }
 
   /// True once in `times`.

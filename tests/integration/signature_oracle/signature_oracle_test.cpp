@@ -1,5 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
-// Signatures made by others, left alone or changed, and judged by them and by us; and ours, judged by them.
+// Signatures by others, changed or not, verified by them and by us; and our signatures, verified by them.
 
 #include "generated_document.h"
 #include "pss_oracle.h"
@@ -34,7 +34,7 @@ using Tarvel::Xml::Security::Signature;
 using Testing::RandomSource;
 
 const std::size_t DOCUMENTS = Testing::Repetitions<std::size_t>(10000, 1000); // for each algorithm
-constexpr std::size_t CHANGES = 4; // signing is dear: so many documents come from one signature
+constexpr std::size_t CHANGES = 4; // documents made from one signature, because signing is slow
 
 const std::string KEYS = Testing::DataPath("tokens/");
 
@@ -74,7 +74,8 @@ std::string Judge(const std::string &text, const KeyInfoResolver &resolver) {
   }
 }
 
-/// Where we refuse on purpose what others let pass, as they do with names that are none in XML Namespaces.
+/// Where we intentionally refuse a document that others accept, for example with names that XML Namespaces does not
+/// allow.
 bool IsOurStrictness(const std::string &verdict) {
   for (const char *reason :
        {"is not Base64", "is relative", "several elements have that identifier", "no element has that identifier",
@@ -107,7 +108,7 @@ struct Tally {
 
 using Verifier = std::function<bool(xmlDoc &)>;
 
-/// Compares verdicts on one text. Nothing may be genuine for us that is not for the others.
+/// Compares verdicts on one text. We must not accept a signature that the others refuse.
 void Compare(const std::string &text, const Verifier &verify, const KeyInfoResolver &resolver, Tally &tally) {
   const Testing::XmlDocHandle document = Testing::ParseWithLibxml2(text);
   if (document && Testing::HasRelativeNamespaceName(*document)) {
@@ -173,7 +174,8 @@ const SignedBy ALGORITHMS[] = {
     {"EcdsaP256Sha256", Uri::ECDSA_SHA256, "sts-ec256", 14},
     {"EcdsaP256Sha384", Uri::ECDSA_SHA384, "sts-ec256", 15},
     {"EcdsaP256Sha512", Uri::ECDSA_SHA512, "sts-ec256", 16},
-    {"EcdsaP384Sha384", Uri::ECDSA_SHA384, "sts-ec384", 17, DOCUMENTS / 10}, // slow curves; the algorithm had its turn
+    {"EcdsaP384Sha384", Uri::ECDSA_SHA384, "sts-ec384", 17,
+     DOCUMENTS / 10}, // slow curve; another row has the algorithm
     {"EcdsaP521Sha512", Uri::ECDSA_SHA512, "sts-ec521", 18, DOCUMENTS / 10},
 };
 
@@ -201,7 +203,7 @@ INSTANTIATE_TEST_SUITE_P(All, PssOracle, ::testing::ValuesIn(PSS_ALGORITHMS), Na
 
 class OurSignature : public ::testing::TestWithParam<SignedBy> {};
 
-TEST_P(OurSignature, VerifiesWithXmlSecUntilSomethingIsChanged) {
+TEST_P(OurSignature, VerifiesWithXmlSecUnlessSomethingIsChanged) {
   RandomSource random(GetParam().seed);
   const Testing::XmlSecKeyHandle theirKey = Testing::LoadXmlSecKey(KEYS + GetParam().key + ".key");
   const auto ourKey = Tarvel::Crypto::LoadPrivateKey(KEYS + GetParam().key + ".key");
@@ -216,7 +218,7 @@ TEST_P(OurSignature, VerifiesWithXmlSecUntilSomethingIsChanged) {
     Ref<Signature> signature;
     Tarvel::Xml::Security::CreateBlankSignature(root, Tarvel::Xml::Security::CanonicalizationUri::EXCLUSIVE,
                                                 GetParam().uri, random.OneOf({"ds", "", "a"}), signature);
-    // Any element but the document element, in which the signature comes to stand.
+    // Any element but the document element, which will contain the signature.
     for (std::size_t references = 1 + random.Below(3); references != 0 && generated.elements > 1; --references) {
       const std::string uri = "#e" + std::to_string(1 + random.Below(generated.elements - 1));
       signature->AddReference(uri, random.OneOf({Uri::DIGEST_SHA256, Uri::DIGEST_SHA384, Uri::DIGEST_SHA512}),

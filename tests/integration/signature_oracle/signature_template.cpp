@@ -72,7 +72,8 @@ private:
     Close(element);
   }
 
-  // The signature stands in the document element, so only a reference to another element does without taking it out.
+  // The signature is in the document element, so any reference but one to another element needs the transform that
+  // removes it.
   void WriteReference(std::size_t elements) {
     const std::size_t element = m_random.OnceIn(2) ? 0 : m_random.Below(elements);
     const bool isEnveloping = element == 0;
@@ -102,8 +103,8 @@ private:
   std::string m_text;
 };
 
-/// A random place behind a ">", but not where the text of a digest or signature value begins: a comment there is refused by
-/// us and passed over by others.
+/// A random place after a ">", but not where the text of a digest or signature value begins: we refuse a comment there,
+/// which others skip.
 std::size_t PlaceBehindTag(const std::string &text, RandomSource &random) {
   std::size_t at = text.find('>', random.Below(text.size()));
   while (at != std::string::npos) {

@@ -16,8 +16,8 @@ namespace Testing {
 std::string AddSignatureTemplate(const GeneratedDocument &document, std::string_view signatureUri,
                                  RandomSource &random);
 
-/// A signed document after a small change that may or may not matter: to content, to the signature, to what stands around
-/// it. The result need not be well-formed.
+/// A signed document after a small change that may or may not matter: to content, to the signature, or around it. The
+/// result need not be well-formed.
 std::string ChangeSomething(std::string text, RandomSource &random);
 
 } // namespace Testing

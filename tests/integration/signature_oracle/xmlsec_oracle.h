@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// The xmlsec1 library, as the other opinion on signatures, and as the signer.
+/// The xmlsec1 library, to sign with and to compare verdicts with.
 
 #pragma once
 
@@ -21,7 +21,8 @@ using XmlSecKeyHandle = std::unique_ptr<xmlSecKey, XmlSecKeyDeleter>;
 /// The private key in a PEM file.
 XmlSecKeyHandle LoadXmlSecKey(const std::string &path);
 
-/// Fills digests and signature value into the first `Signature` element of the document. @return whether that succeeded.
+/// Fills digests and signature value into the first `Signature` element of the document. @return whether that
+/// succeeded.
 bool SignWithXmlSec(xmlDoc &document, const xmlSecKey &key);
 
 /// Whether the first `Signature` element of the document verifies. All errors count as no.

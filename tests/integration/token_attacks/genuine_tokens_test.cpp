@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
-// The other side of the attacks: every genuine token, in every way of writing, canonicalising and signing that the profile
-// has, is accepted; and the few that are signed well but may not be are not.
+// The counterpart of the attacks: every genuine token, in every way of writing, canonicalising and signing that the
+// profile allows, is accepted, except the few with a correct signature that must be refused for another reason.
 
 #include "outcome.h"
 
@@ -20,7 +20,7 @@ namespace {
 
 constexpr const char *CHANGED = "Failed to verify signature: token might have been tampered with.";
 
-TEST(GenuineTokens, AreAcceptedButForThoseOutOfDateOrSignedByNobodyTrusted) {
+TEST(GenuineTokens, AreAcceptedUnlessOutOfDateOrSignedWithAnUntrustedKey) {
   const std::map<std::string, Outcome> refused = {
       {"expired", {"ParseException", "The token has expired at: 2021-01-01T00:00:00.000Z"}},
       {"early", {"ParseException", "Token start date is in the future: 2110-01-01T00:00:00.000Z"}},
@@ -48,7 +48,7 @@ TEST(GenuineTokens, AreAcceptedButForThoseOutOfDateOrSignedByNobodyTrusted) {
   EXPECT_EQ(34, accepted);
 }
 
-TEST(GenuineTokens, SayTheSameInEveryWayOfWriting) {
+TEST(GenuineTokens, HaveTheSameFactsInEveryWayOfWriting) {
   const auto withoutId = [](const Outcome &outcome) { return outcome.text.substr(outcome.text.find('\n')); };
   const std::string expected = withoutId(TryToken(ReadToken("full")));
   for (const char *name : {"c14n-inclusive", "c14n-inclusive-with-comments", "c14n-exclusive-with-comments",
@@ -64,7 +64,7 @@ TEST(GenuineTokens, SignedWithARetiredCertificateOfATrustedKeyAreAccepted) {
   EXPECT_EQ("alice", SsoClient::CreateSamlToken(ReadToken("bearer"), reissued)->GetSubject().name);
 }
 
-TEST(GenuineTokens, AreRefusedWhenNobodyIsTrusted) {
+TEST(GenuineTokens, AreRefusedWithoutTrustedCertificates) {
   try {
     SsoClient::CreateSamlToken(ReadToken("bearer"), Tarvel::Crypto::CertificateList());
     FAIL() << "accepted";
@@ -73,7 +73,7 @@ TEST(GenuineTokens, AreRefusedWhenNobodyIsTrusted) {
   }
 }
 
-TEST(GenuineTokens, SignedWithAShortRsaKeyAreRefusedByName) {
+TEST(GenuineTokens, SignedWithAShortRsaKeyAreRefusedForThatReason) {
   const Tarvel::Crypto::CertificateList shortKey = {
       Tarvel::Crypto::CreateCertificateFromPem(Testing::ReadDataFile("tokens/sts-rsa1024.crt"))};
   try {

@@ -1,5 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
-// However a document of the greatest length fills the limits: reading it takes a bounded part of the heap.
+// Reading a document of the maximum length takes a bounded part of the heap, however the document reaches the limits.
 
 #include "heap_octets.h"
 #include "outcome.h"
@@ -44,8 +44,8 @@ void PrintTo(const LargeDocument &document, std::ostream *out) {
   *out << document.name;
 }
 
-/// As many elements as there may be, and at the end, which has `nodes` nodes and attributes, something long. A reference at
-/// the beginning has the reader make its buffer when the rest of the document is longest.
+/// As many elements as are allowed, and something long at the end, which has `nodes` nodes and attributes. Because of a
+/// reference at the beginning, the reader makes its buffer when the rest of the document is longest.
 std::string WithElements(const std::string &end, std::size_t nodes) {
   return "<r>" + REFERENCE + Repeated("<a/>", MAX_NODES - 2 - nodes) + end + "</r>";
 }
@@ -58,7 +58,7 @@ std::string DecodedInPieces() {
   return Repeated(piece, LEFT_BESIDE_ELEMENTS / piece.size());
 }
 
-/// Longer when it is decoded than any other text of its length that cannot be used where it is.
+/// No other text of its length that needs decoding is longer after it.
 std::string LongestDecoded() {
   return REFERENCE + std::string(LEFT_BESIDE_ELEMENTS - REFERENCE.size(), 'x');
 }
@@ -148,7 +148,7 @@ TEST_P(LargestDocuments, TakeABoundedPartOfTheHeapToParse) {
   const auto reader = Tarvel::CreateStringReader(xml);
   const auto document = Tarvel::Xml::CreateXMLParser(Tarvel::Xml::CreateXMLDocumentHandler())->Parse(*reader);
   EXPECT_LE(heap.GetPeak(), MAX_HEAP_OCTETS);
-  EXPECT_GT(heap.GetPeak(), xml.size()); // the reader's copy, which says that somebody counts
+  EXPECT_GT(heap.GetPeak(), xml.size()); // at least the reader's copy: the heap is really counted
   EXPECT_TRUE(document);
 }
 

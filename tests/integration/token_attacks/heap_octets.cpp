@@ -10,7 +10,7 @@
 namespace {
 
 std::size_t g_allocated = 0;
-std::size_t g_live = 0; // with what the C library adds to each piece
+std::size_t g_live = 0; // including what the C library adds to each piece
 std::size_t g_peak = 0;
 
 void *Allocate(std::size_t size) {

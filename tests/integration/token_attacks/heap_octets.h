@@ -8,8 +8,8 @@
 
 namespace Attacks {
 
-/// Octets from the heap since it began: all that were asked for, and the most that were in use at once. One at a time, in a
-/// program that allocates on one thread.
+/// Counts octets from the heap since its construction: the total allocated, and the most in use at once. Only one
+/// object at a time, in a program that allocates on one thread.
 class HeapCount {
 public:
   HeapCount() noexcept;

@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
-// Documents that are large in one dimension: refused at a documented limit, or read at a cost that grows with their length
-// and no faster. Cost is counted in octets allocated, which no load on the machine can change.
+// Documents that are large in one dimension: refused at a documented limit, or read at a cost that grows no faster than
+// their length. The cost is the number of octets allocated, which does not depend on the load of the machine.
 
 #include "heap_octets.h"
 #include "outcome.h"
@@ -59,7 +59,7 @@ TEST(Limits, DepthOf100000IsRefusedAtTheLimit) {
   const Counted counted = CountToken(Repeated("<x>", MANY) + Repeated("</x>", MANY));
   EXPECT_EQ("XMLParseException", counted.outcome.exceptionClass);
   EXPECT_EQ("elements are nested deeper than 256 at line 1, column 769", counted.outcome.text);
-  // Beyond the copy of the text there is nothing but the 256 elements.
+  // Only the copy of the text and the 256 elements.
   EXPECT_LT(counted.octets, 7u * MANY * 4);
 }
 
@@ -131,7 +131,7 @@ TEST(Limits, AMillionInclusivePrefixesAreRefusedWithoutAListOfThem) {
       (Outcome{"InvalidSignatureException", "Signature verification error. The PrefixList of the algorithm "
                                             "\"http://www.w3.org/2001/10/xml-exc-c14n#\" has more than 256 prefixes"}),
       counted.outcome);
-  // Texts of the document's length, and nothing for each prefix.
+  // Texts of the document's length, and no memory for each prefix.
   EXPECT_LT(counted.octets, 10 * list.size());
 }
 

@@ -19,7 +19,7 @@ namespace {
 
 using namespace SsoClient;
 
-// The exact class counts: a class derived from a documented one would be a surprise as well.
+// The exact class counts: a class derived from a documented one would be unexpected too.
 std::string ClassOf(const std::exception &failure) {
   const std::type_info &type = typeid(failure);
   if (type == typeid(ParseException)) {

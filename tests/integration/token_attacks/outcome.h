@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// `Outcome`, what came of a token: its facts, or the documented exception that refused it.
+/// `Outcome`, the result for a token: its facts, or the documented exception that refused it.
 
 #pragma once
 
@@ -27,17 +27,18 @@ std::ostream &operator<<(std::ostream &out, const Outcome &outcome);
 /// The service's certificates that the fixtures are signed with, one of each algorithm; not "other".
 const Tarvel::Crypto::CertificateList &Trusted();
 
-/// What comes of `xml` with those certificates and the default tolerance.
+/// The outcome for `xml` with those certificates and the default tolerance.
 Outcome TryToken(const std::string &xml);
 
-/// What comes of the assertion number `index` (from 0, in document order) of the document `xml`.
+/// The outcome for the assertion number `index` (from 0, in document order) of the document `xml`.
 /// @throws std::out_of_range when there are fewer.
 Outcome TryElement(const std::string &xml, std::size_t index);
 
 /// A token fixture by its name without folder and extension.
 std::string ReadToken(const std::string &name);
 
-/// `text` with the first `from` replaced by `to`. @throws std::logic_error when there is none: the test is then wrong.
+/// `text` with the first `from` replaced by `to`. @throws std::logic_error when `text` does not contain `from`:
+/// the test is wrong then.
 std::string Replaced(std::string text, const std::string &from, const std::string &to);
 
 } // namespace Attacks

@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
-// Every prefix, and thousands of small damages, of genuine tokens: never another exception than the documented ones, and
-// never a token that says something else than what was signed.
+// Every prefix of genuine tokens, and thousands of small changes to them: never an undocumented exception, and never a
+// token with facts other than those that were signed.
 
 #include "outcome.h"
 #include "support/data_file.h"
@@ -39,9 +39,9 @@ class Truncation : public testing::TestWithParam<std::string> {};
 TEST_P(Truncation, EveryPrefixIsRefusedByTheParser) {
   const std::string xml = ReadToken(GetParam());
   const Outcome whole = TryToken(xml);
-  // Beyond the end tag only comments and white space follow, and to cut those is no harm.
+  // Only comments and white space follow the end tag; cutting them changes nothing.
   const std::size_t rootEnd = xml.rfind("Assertion>") + std::string("Assertion>").size();
-  // The large token repeats one line, and a prime step visits each place of that line.
+  // The large token repeats one line; steps of a prime length reach each place of that line.
   const std::size_t step = xml.size() > 20000 ? Testing::Repetitions<std::size_t>(1, 61) : 1;
   for (std::size_t length = 0; length < rootEnd; length += step) {
     const Outcome outcome = TryToken(xml.substr(0, length));
@@ -65,8 +65,9 @@ class Mutation : public testing::TestWithParam<std::string> {
 protected:
   void SetUp() override { ASSERT_TRUE(m_genuine.IsAccepted()) << m_genuine; }
 
-  /// Small tokens get every damage at every place. In large ones the damages take turns, so that the sweep stays short;
-  /// under a sanitizer, where each costs many times as much and the same fuzz target runs too, they do in all.
+  /// Small tokens get every kind of change at every place. In large ones the kinds alternate, so that the sweep stays
+  /// short; under a sanitizer, where each costs many times as much and the same fuzz target runs too, they alternate in
+  /// all tokens.
   bool IsTurn(std::size_t damage, std::size_t damages, std::size_t place) const {
     return (m_xml.size() < 2500 && !Testing::IS_SANITIZED) || place % damages == damage;
   }
@@ -120,7 +121,7 @@ TEST_P(Mutation, EachChunkDeletedOrDoubledNeverYieldsOtherFacts) {
   }
 }
 
-/// Where each element, with all that is in it, begins and ends, found by the tags alone.
+/// Where each element, including its content, begins and ends, found by the tags alone.
 std::vector<std::pair<std::size_t, std::size_t>> ElementRanges(const std::string &xml) {
   std::vector<std::pair<std::size_t, std::size_t>> ranges;
   std::vector<std::size_t> open;

@@ -20,7 +20,7 @@ struct Change {
   const char *message = CHANGED;
 };
 
-// What no check before the signature notices ends in the signature's message.
+// A change that no check before the signature notices ends in the signature's message.
 const Change CHANGES[] = {
     {"Version", "Version=\"2.0\"", "Version=\"2.1\"", "ParseException", "Invalid token version"},
     {"Id", "ID=\"_", "ID=\"_0", "ParseException", "Token's signature must cover the entire token"},
@@ -99,7 +99,7 @@ TEST(TamperingBearer, ConfirmationEndThatNoLongerCoversTheTokenIsRefused) {
   EXPECT_EQ((Outcome{"ParseException", "Invalid token subject validity"}), TryToken(xml));
 }
 
-TEST(TamperingBearer, TakingTheKeyAwayFromAHolderOfKeyTokenIsRefused) {
+TEST(TamperingBearer, RemovingTheKeyFromAHolderOfKeyTokenIsRefused) {
   std::string xml = ReadToken("holder-of-key");
   const std::size_t begin = xml.find("<saml:SubjectConfirmationData");
   const std::string end = "</saml:SubjectConfirmationData>";
@@ -109,7 +109,7 @@ TEST(TamperingBearer, TakingTheKeyAwayFromAHolderOfKeyTokenIsRefused) {
   EXPECT_EQ((Outcome{"InvalidSignatureException", CHANGED}), TryToken(xml));
 }
 
-TEST(TamperingHarmless, ChangesThatTheCanonicalFormDoesNotShowKeepTheTokenGood) {
+TEST(TamperingHarmless, ChangesThatTheCanonicalFormDoesNotShowKeepTheTokenValid) {
   const std::string genuine = ReadToken("full");
   const Outcome expected = TryToken(genuine);
   ASSERT_TRUE(expected.IsAccepted()) << expected;

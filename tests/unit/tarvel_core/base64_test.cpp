@@ -60,7 +60,7 @@ TEST(Base64Decode, ReadsTheVectorsOfRfc4648) {
   }
 }
 
-TEST(Base64Encode, WritesWhatOpenSslWritesForEveryLengthOfALastGroup) {
+TEST(Base64Encode, AgreesWithOpenSslForEveryLengthOfALastGroup) {
   std::mt19937 random(4648);
   for (std::size_t length = 0; length < 300; ++length) {
     std::vector<std::uint8_t> bytes(length);
@@ -81,7 +81,7 @@ TEST(Base64Encode, WritesNoLineBreaks) {
   EXPECT_EQ(Encoded(std::string(300, '\0')), std::string(400, 'A'));
 }
 
-TEST(Base64EncodedLength, IsWhatIsWritten) {
+TEST(Base64EncodedLength, IsTheNumberOfCharactersWritten) {
   for (std::size_t length = 0; length < 10; ++length) {
     const std::vector<std::uint8_t> bytes(length, 0xFF);
     std::string text(Base64_EncodedLength(length) + 1, '!');
@@ -165,7 +165,7 @@ TEST(Base64Decode, RefusesEveryByteOutsideAlphabetPaddingAndWhiteSpace) {
     const bool accepted = RefusalOf(std::string("Zm9v") + c + std::string("Zm9vZg==").substr(1)) == "accepted";
     const bool blank = allowed.find(c, 64) != std::string::npos;
     const bool letter = !blank && allowed.find(c) != std::string::npos;
-    // The group is one short without the byte: a letter completes it, white space leaves it so.
+    // Without the byte the group is one character short: a letter completes it, white space does not.
     EXPECT_EQ(accepted, letter) << byte;
     EXPECT_EQ(RefusalOf(std::string("Zm9v") + c + "Zm9v") == "accepted", blank) << byte;
   }

@@ -88,7 +88,7 @@ TEST(Exception, KeepsTheMessageAsGiven) {
   EXPECT_STREQ(Exception("").what(), "");
 }
 
-TEST(Exception, AssignmentTakesOverMessageAndOutlivesTheSource) {
+TEST(Exception, KeepsAnAssignedMessageLongerThanItsSource) {
   Exception target("first");
   {
     const Exception source("second");
@@ -129,7 +129,7 @@ TEST(Exception, WhereIsAFrameOfTheCallStack) {
   EXPECT_NE(error.GetBacktrace().find(error.Where() + '\n'), std::string::npos);
 }
 
-TEST(Exception, WhereIsNotTheExceptionsOwnConstructor) {
+TEST(Exception, WhereIsNotAConstructorOfTheException) {
   EXPECT_EQ(InvalidArgumentException("x").Where().find("InvalidArgumentException::"), std::string::npos);
 }
 
@@ -160,7 +160,7 @@ TEST(OutOfMemoryException, HasOneMessageAndNoCallStack) {
   EXPECT_THROW(copy->Throw(), OutOfMemoryException);
 }
 
-TEST(CheckedCast, GivesTheSameObjectAsItsClass) {
+TEST(CheckedCast, ReturnsTheSameObjectAsItsClass) {
   const Ref<Object> object = MakeRef<Apple>();
   EXPECT_EQ(CheckedCast<Apple>(object).get(), object.get());
   EXPECT_EQ(CheckedCast<Fruit>(object).get(), object.get());

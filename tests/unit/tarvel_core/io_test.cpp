@@ -34,7 +34,7 @@ std::string IOErrorOf(const T &action) {
   return "nothing was raised";
 }
 
-/// A reader that hands out one byte at a time, without end when `length` is the largest there is.
+/// A reader that returns one byte at a time, `length` of them; for the largest number, without end.
 class DripReader final : public Reader {
 public:
   explicit DripReader(std::size_t length) : m_left(length) {}
@@ -51,7 +51,7 @@ private:
   std::size_t m_left;
 };
 
-/// A file of this process alone, removed at the end.
+/// A temporary file, removed at the end.
 class TemporaryFile {
 public:
   explicit TemporaryFile(std::string_view content) {
@@ -74,7 +74,7 @@ TEST(StringReader, ReadsInPiecesToTheEnd) {
   EXPECT_EQ(ReadSome(*reader, 4), "");
 }
 
-TEST(StringReader, ReadToEndGivesTheRestOnce) {
+TEST(StringReader, ReadToEndReturnsTheRestOnce) {
   const Ref<Reader> reader = CreateStringReader(std::string("ab\0cd", 5));
   EXPECT_EQ(ReadSome(*reader, 1), "a");
   EXPECT_EQ(reader->ReadToEnd(NO_LIMIT), std::string("b\0cd", 4));
@@ -97,7 +97,7 @@ TEST(ReaderReadToEnd, StopsOneByteAfterTheLimit) {
   EXPECT_EQ(reader->ReadToEnd(100).size(), 101U);
 }
 
-TEST(ReaderReadToEnd, GivesExactlyTheLimitWhenThatIsAll) {
+TEST(ReaderReadToEnd, ReturnsTextOfExactlyTheLimit) {
   const Ref<Reader> reader = MakeRef<DripReader>(std::size_t{100});
   EXPECT_EQ(reader->ReadToEnd(100), std::string(100, 'x'));
 }
@@ -111,7 +111,7 @@ TEST(StringWriter, KeepsWhatIsWrittenInOrder) {
   EXPECT_EQ(writer->GetText(), std::string("ab\0c", 4));
 }
 
-TEST(StringWriter, TakeTextStartsAgainFromNothing) {
+TEST(StringWriter, StartsAgainWithAnEmptyTextAfterTakeText) {
   const Ref<StringWriter> writer = CreateStringWriter();
   writer->Write("first");
   EXPECT_EQ(writer->TakeText(), "first");
@@ -138,7 +138,7 @@ TEST(OpenFile, ClosesTheFileWithTheReader) {
   EXPECT_EQ(again, lowestFree);
 }
 
-TEST(OpenFile, NamesTheFileAndTheReasonWhenThereIsNone) {
+TEST(OpenFile, ReportsPathAndReasonOfAMissingFile) {
   EXPECT_EQ(IOErrorOf([] { OpenFile("/nonexistent/file"); }),
             "Cannot open /nonexistent/file: No such file or directory");
 }
@@ -167,7 +167,7 @@ TEST(DescriptorReader, ReadsAPipeToItsEndAndLeavesItOpen) {
   ::close(ends[0]);
 }
 
-TEST(DescriptorReader, NamesTheDescriptorAndTheReason) {
+TEST(DescriptorReader, ReportsDescriptorAndReason) {
   EXPECT_EQ(IOErrorOf([] { CreateDescriptorReader(-1)->ReadToEnd(NO_LIMIT); }),
             "Cannot read file descriptor -1: Bad file descriptor");
 }

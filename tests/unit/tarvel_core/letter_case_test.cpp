@@ -14,7 +14,7 @@ struct Mapping {
   std::string upper;
 };
 
-/// Letters whose simple mappings go both ways, in UTF-8 of one to four bytes.
+/// Letters with a simple mapping in both directions, of one to four bytes in UTF-8.
 const Mapping PAIRS[] = {{"", ""},
                          {"abcdefghijklmnopqrstuvwxyz", "ABCDEFGHIJKLMNOPQRSTUVWXYZ"},
                          {"corp.example-1_@", "CORP.EXAMPLE-1_@"},
@@ -52,7 +52,7 @@ TEST(StringUtilToLower, MapsEverySigmaToTheCommonForm) {
   EXPECT_EQ(StringUtil::ToLower("ΣΑΣ"), "σασ");
 }
 
-TEST(StringUtilToUpper, LeavesWhatIsNoLetter) {
+TEST(StringUtilToUpper, LeavesCharactersThatAreNotLetters) {
   const std::string text = "0123 \t~{}€漢字😀\x7F";
   EXPECT_EQ(StringUtil::ToUpper(text), text);
   EXPECT_EQ(StringUtil::ToLower(text), text);

@@ -48,7 +48,7 @@ TEST(MessageFormatter, LeavesPlaceholdersWithoutArgument) {
   EXPECT_EQ(MessageFormatter::ASPrint("%1"), "%1");
 }
 
-TEST(MessageFormatter, LeavesWhatIsNoPlaceholder) {
+TEST(MessageFormatter, LeavesTextThatIsNotAPlaceholder) {
   for (const char *format : {"", "%", "100 %", "%0", "%x", "% 1", "a%", "%s%n"}) {
     EXPECT_EQ(MessageFormatter::ASPrint(format, "a"), format);
   }
@@ -74,7 +74,7 @@ TEST(MessageFormatter, WritesBooleansAsWords) {
   EXPECT_EQ(MessageFormatter::ASPrint("%1 %2", true, false), "true false");
 }
 
-TEST(MessageFormatter, WritesNumbersWhole) {
+TEST(MessageFormatter, WritesAllDigitsOfNumbers) {
   EXPECT_EQ(MessageFormatter::ASPrint("%1 %2", LLONG_MIN, ULLONG_MAX), "-9223372036854775808 18446744073709551615");
   EXPECT_EQ(MessageFormatter::ASPrint("%1 %2 %3", std::int8_t{-5}, std::uint8_t{200}, short{7}), "-5 200 7");
 }

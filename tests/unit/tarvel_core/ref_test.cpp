@@ -53,7 +53,7 @@ TEST(Ref, SelfAssignmentKeepsTheObject) {
   EXPECT_EQ(alive, 1);
 }
 
-TEST(Ref, DetachHandsTheCountOver) {
+TEST(Ref, DetachTransfersTheCount) {
   std::atomic<int> alive{0};
   Ref<Counted> ref = MakeRef<Counted>(alive);
   const Counted *const raw = ref.Detach();

@@ -47,7 +47,7 @@ TEST(SecretText, CopiesAndMoves) {
   EXPECT_EQ(second.Get(), "second");
 }
 
-TEST(SecretText, AppendsToWhatItHolds) {
+TEST(SecretText, AppendsToItsText) {
   SecretText secret("a");
   std::string expected = "a";
   for (int i = 0; i < 1000; ++i) {

@@ -9,13 +9,13 @@
 namespace Tarvel {
 namespace {
 
-TEST(Shorten, KeepsATextOfAtMostTheGivenLength) {
+TEST(Shorten, ReturnsATextOfAtMostTheGivenLengthUnchanged) {
   EXPECT_EQ("", StringUtil::Shorten("", 0));
   EXPECT_EQ("abc", StringUtil::Shorten("abc", 3));
   EXPECT_EQ(std::string(1024, 'x'), StringUtil::Shorten(std::string(1024, 'x')));
 }
 
-TEST(Shorten, SaysHowManyBytesAreLeftOut) {
+TEST(Shorten, CountsTheBytesThatAreLeftOut) {
   EXPECT_EQ("... (3 more bytes)", StringUtil::Shorten("abc", 0));
   EXPECT_EQ("ab... (1 more bytes)", StringUtil::Shorten("abc", 2));
   EXPECT_EQ(std::string(1024, 'x') + "... (1 more bytes)", StringUtil::Shorten(std::string(1025, 'x')));
@@ -39,7 +39,7 @@ TEST(Shorten, CutsBetweenTwoCharacters) {
   }
 }
 
-TEST(Shorten, CutsWhatIsNotUtf8WhereverItIsTooLong) {
+TEST(Shorten, CutsTextThatIsNotUtf8AtTheGivenLength) {
   const std::string text(1000, '\x80');
   EXPECT_EQ(text.substr(0, 97) + "... (903 more bytes)", StringUtil::Shorten(text, 100));
 }

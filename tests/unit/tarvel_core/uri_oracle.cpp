@@ -28,7 +28,7 @@ bool IsUriOfLibxml2(const std::string &text) {
   return UriHandle(xmlParseURI(text.c_str())) != nullptr;
 }
 
-/// `text`, which we accept, with a port that libxml2 accepts as well.
+/// `text`, which we accept, with a port that libxml2 accepts too.
 std::string CorrectPort(std::string text, UriComparison &comparison) {
   const std::optional<std::string_view> port = SplitUriReference(text)->port;
   if (!port) {
@@ -42,7 +42,7 @@ std::string CorrectPort(std::string text, UriComparison &comparison) {
   return text.replace(static_cast<std::size_t>(port->data() - text.data()), port->size(), "1");
 }
 
-/// `text`, which libxml2 accepts, without what the standard does not.
+/// `text`, which libxml2 accepts, without the parts that the standard does not allow.
 std::string CorrectBrackets(std::string text, UriComparison &comparison) {
   const std::size_t slashes = text.find("//");
   const std::size_t open = text.find('[');

@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// Our reading of RFC 3986 compared with libxml2's.
+/// Compares our parser of URI references with libxml2's.
 
 #pragma once
 

@@ -55,7 +55,7 @@ TEST_F(UriReferenceOracle, AgreesOnEachCharacterAtEachPlace) {
   EXPECT_GT(GetAccepted(), 15'000U);
 }
 
-TEST_F(UriReferenceOracle, AgreesOnTextsPutTogetherFromPieces) {
+TEST_F(UriReferenceOracle, AgreesOnTextsMadeOfPieces) {
   const std::string_view pieces[] = {"s",
                                      "1",
                                      ":",

@@ -16,7 +16,7 @@ namespace {
 
 constexpr std::optional<std::string_view> NONE = std::nullopt;
 
-TEST(SplitUriReference, GivesEachPartAsItIsWritten) {
+TEST(SplitUriReference, ReturnsEachPartUnchanged) {
   const std::optional<UriReference> parts = SplitUriReference("hTTp+1://a:%41@h%2F.x:080/b//%63:@?d/?%20e#f?/%25");
   ASSERT_TRUE(parts);
   EXPECT_EQ(parts->scheme, "hTTp+1");
@@ -28,7 +28,7 @@ TEST(SplitUriReference, GivesEachPartAsItIsWritten) {
   EXPECT_EQ(parts->fragment, "f?/%25");
 }
 
-TEST(SplitUriReference, TellsMissingPartsFromEmptyOnes) {
+TEST(SplitUriReference, DistinguishesMissingPartsFromEmptyOnes) {
   const std::optional<UriReference> without = SplitUriReference("");
   ASSERT_TRUE(without);
   EXPECT_EQ(without->scheme, NONE);
@@ -49,7 +49,7 @@ TEST(SplitUriReference, TellsMissingPartsFromEmptyOnes) {
   EXPECT_EQ(with->fragment, "");
 }
 
-TEST(SplitUriReference, KeepsTheBracketsOfAnAddressAndDoesNotJudgeWhatIsInThem) {
+TEST(SplitUriReference, KeepsTheBracketsOfAnAddressAndDoesNotCheckTheirContent) {
   const std::optional<UriReference> parts = SplitUriReference("x://[no address]:1/");
   ASSERT_TRUE(parts);
   EXPECT_EQ(parts->host, "[no address]");
@@ -57,7 +57,7 @@ TEST(SplitUriReference, KeepsTheBracketsOfAnAddressAndDoesNotJudgeWhatIsInThem) 
   EXPECT_FALSE(IsUriReference("x://[no address]:1/"));
 }
 
-TEST(SplitUriReference, GivesViewsOfTheText) {
+TEST(SplitUriReference, ReturnsViewsOfTheText) {
   const std::string text = "s://h/p";
   const std::optional<UriReference> parts = SplitUriReference(text);
   ASSERT_TRUE(parts);
@@ -76,7 +76,7 @@ TEST(IsUriReference, AcceptsTheExamplesOfTheStandard) {
   }
 }
 
-TEST(IsUriReference, AcceptsWhatNamespacesAreCalled) {
+TEST(IsUriReference, AcceptsNamespaceNames) {
   for (const char *const text :
        {"urn:oasis:names:tc:SAML:2.0:assertion", "http://www.w3.org/2000/09/xmldsig#",
         "http://docs.oasis-open.org/wss/2004/01/oasis-200401-wss-wssecurity-secext-1.0.xsd", "relative", "/", "#x"}) {
@@ -184,7 +184,7 @@ TEST(IsIpLiteral, FollowsTheGrammarOfTheStandard) {
   EXPECT_GT(accepted, 100U);
 }
 
-TEST(IsIpLiteral, HasAddressesOfLaterVersionsAndNoZones) {
+TEST(IsIpLiteral, AcceptsAddressesOfLaterVersionsAndRefusesZones) {
   for (const char *const host : {"[v1.x]", "[VaF.:!]", "[v0.~]"}) {
     EXPECT_TRUE(IsIpLiteral(host)) << host;
   }

@@ -50,7 +50,7 @@ TEST_F(LoggerTest, PrintsNothingWithoutSink) {
   EXPECT_EQ(testing::internal::GetCapturedStderr(), "");
 }
 
-TEST_F(LoggerTest, HandsNameLevelAndFormattedMessageToTheSink) {
+TEST_F(LoggerTest, PassesNameLevelAndFormattedMessageToTheSink) {
   Gather();
   const Ref<Logger> logger = Logger::CreateLogger(m_root, "Name", LEVEL_OPERATION);
   EXPECT_EQ(logger->GetName(), "Name");
@@ -58,7 +58,7 @@ TEST_F(LoggerTest, HandsNameLevelAndFormattedMessageToTheSink) {
   EXPECT_EQ(m_lines, std::vector<std::string>{"Name/64/opId=17 END operation"});
 }
 
-TEST_F(LoggerTest, CutsALineBeyondTheGreatestLength) {
+TEST_F(LoggerTest, CutsALineAtTheMaximumLength) {
   Gather();
   const Ref<Logger> logger = Logger::CreateLogger(m_root, "L", LEVEL_OPERATION);
   const std::string whole(StringUtil::MAX_LINE_BYTES, 'x');
@@ -70,7 +70,7 @@ TEST_F(LoggerTest, CutsALineBeyondTheGreatestLength) {
   EXPECT_LT(m_lines.back().size(), 8u * 1024);
 }
 
-TEST_F(LoggerTest, LetsLinesThroughUpToItsLevel) {
+TEST_F(LoggerTest, WritesLinesUpToItsLevel) {
   Gather();
   const Ref<Logger> logger = Logger::CreateLogger(m_root, "L", LEVEL_WARNING);
   EXPECT_EQ(logger->GetLevel(), LEVEL_WARNING);
@@ -100,7 +100,7 @@ TEST_F(LoggerTest, FormatsNothingForALineThatIsDropped) {
   EXPECT_EQ(formatted, 1);
 }
 
-TEST_F(LoggerTest, SwallowsWhatTheSinkRaises) {
+TEST_F(LoggerTest, IgnoresAnExceptionOfTheSink) {
   const Ref<Logger> logger = Logger::CreateLogger(m_root, "L", LEVEL_OPERATION);
   int calls = 0;
   m_root->SetSink([&](const LogRecord &) {
@@ -132,7 +132,7 @@ TEST_F(LoggerTest, ReplacesAndRemovesTheSink) {
   EXPECT_EQ(second, 1);
 }
 
-TEST_F(LoggerTest, LetsASinkLogAndReplaceItself) {
+TEST_F(LoggerTest, AllowsASinkToLogAndToReplaceItself) {
   const Ref<Logger> logger = Logger::CreateLogger(m_root, "L", LEVEL_OPERATION);
   int calls = 0;
   m_root->SetSink([&](const LogRecord &) {

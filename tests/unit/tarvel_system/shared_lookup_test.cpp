@@ -1,5 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
-// Which look-ups of names are one, and how many there are at a time.
+// Which callers share a look-up, and how many look-ups run at a time.
 #include "system/shared_lookup.h"
 
 #include "support/completion.h"
@@ -27,8 +27,8 @@ using Testing::Eventually;
 using Testing::PATIENCE;
 using Testing::UnusedPort;
 
-/// Replaces the resolver. Names that are held get no answer until they are released; every name has the address
-/// 127.0.0.1, or the failure that is set.
+/// Replaces the resolver. A name that is held gets no answer until it is released; every name has the address
+/// 127.0.0.1, or fails with the failure that is set.
 class ResolverStandIn {
 public:
   ResolverStandIn()
@@ -36,7 +36,7 @@ public:
         m_scope([state = m_state](const std::string &host) { return state->LookUp(host); }) {}
   ResolverStandIn(const ResolverStandIn &) = delete;
   ResolverStandIn &operator=(const ResolverStandIn &) = delete;
-  /// No look-up of this test may share one of the next.
+  /// The next test must not join a look-up of this one.
   ~ResolverStandIn() {
     ReleaseAll();
     EXPECT_TRUE(Eventually([this] { return CountRunning() == 0; }));
@@ -64,7 +64,7 @@ public:
     m_state->failure = message;
   }
 
-  /// The names that look-ups have begun for, in this order.
+  /// The names for which a look-up has begun, in order.
   std::vector<std::string> GetBegun() const {
     const std::lock_guard<std::mutex> lock(m_state->mutex);
     return m_state->begun;
@@ -113,7 +113,7 @@ private:
   const ScopedNameLookup m_scope;
 };
 
-/// A connect that has been started, to a port that refuses.
+/// A started connect to a port that refuses connections.
 class Asking {
 public:
   explicit Asking(const std::string &host) {
@@ -145,7 +145,7 @@ private:
 
 using Names = std::vector<std::string>;
 
-/// Holds names that are nobody else's, and asks for each.
+/// Holds names that no other test uses, and asks for each.
 std::vector<Asking> AskForDeadNames(ResolverStandIn &resolver, std::size_t count) {
   std::vector<Asking> dead;
   for (std::size_t i = 0; i < count; ++i) {
@@ -165,7 +165,7 @@ std::vector<Asking> AskTimes(std::size_t count, const std::string &name) {
   return asking;
 }
 
-TEST(SharedLookup, IsOneForAllThatAskForTheName) {
+TEST(SharedLookup, ServesAllCallersWithTheSameName) {
   ResolverStandIn resolver;
   resolver.Hold("sts.example");
   const std::vector<Asking> asking = AskTimes(100, "sts.example");
@@ -176,7 +176,7 @@ TEST(SharedLookup, IsOneForAllThatAskForTheName) {
   EXPECT_EQ(resolver.GetBegun(), Names{"sts.example"});
 }
 
-TEST(SharedLookup, IsOneInWhateverLetterCase) {
+TEST(SharedLookup, IgnoresTheLetterCaseOfTheName) {
   ResolverStandIn resolver;
   resolver.Hold("Sts.Example");
   const Asking first("Sts.Example");
@@ -189,7 +189,7 @@ TEST(SharedLookup, IsOneInWhateverLetterCase) {
   EXPECT_EQ(resolver.GetBegun().size(), 2u);
 }
 
-TEST(SharedLookup, FailsForAllThatAskedForTheName) {
+TEST(SharedLookup, FailsForAllCallersWithTheSameName) {
   ResolverStandIn resolver;
   resolver.Hold("sts.example");
   resolver.FailWith("Name or service not known");
@@ -219,7 +219,7 @@ TEST(SharedLookup, KeepsNoAddressForLaterRequests) {
   EXPECT_EQ(resolver.GetBegun(), (Names{"sts.example", "sts.example"}));
 }
 
-TEST(SharedLookup, IsNotDisturbedByOneThatStopsWaiting) {
+TEST(SharedLookup, GoesOnWhenOneCallerStopsWaiting) {
   ResolverStandIn resolver;
   resolver.Hold("sts.example");
   Asking leaving("sts.example");
@@ -232,7 +232,7 @@ TEST(SharedLookup, IsNotDisturbedByOneThatStopsWaiting) {
   EXPECT_EQ(resolver.GetBegun(), Names{"sts.example"});
 }
 
-TEST(SharedLookup, TakesInWhoAsksAfterAllOthersHaveLeft) {
+TEST(SharedLookup, IsJoinedAfterAllOtherCallersStoppedWaiting) {
   ResolverStandIn resolver;
   resolver.Hold("sts.example");
   for (Asking &one : AskTimes(100, "sts.example")) {
@@ -245,7 +245,7 @@ TEST(SharedLookup, TakesInWhoAsksAfterAllOthersHaveLeft) {
   EXPECT_EQ(resolver.GetBegun(), Names{"sts.example"});
 }
 
-TEST(SharedLookup, ThatEndsAfterAllHaveLeftIsForgotten) {
+TEST(SharedLookup, IsForgottenWhenItEndsAfterAllCallersStoppedWaiting) {
   ResolverStandIn resolver;
   resolver.Hold("sts.example");
   Asking gone("sts.example");
@@ -255,13 +255,13 @@ TEST(SharedLookup, ThatEndsAfterAllHaveLeftIsForgotten) {
   resolver.Release("sts.example");
   ASSERT_TRUE(resolver.WaitUntilRunning(0));
   resolver.FailWith("");
-  // The first look-up has its result, but may not have left yet: whoever joins it gets that.
+  // The first look-up has its result, but may still be registered: a caller that joins it gets that result.
   EXPECT_TRUE(Eventually([] { return Asking("sts.example").GetOutcome() == "looked up"; }));
   EXPECT_EQ(gone.GetOutcome(), "cancelled");
   EXPECT_EQ(gone.CountCalls(), 1);
 }
 
-TEST(SharedLookup, SixtyThreeDeadNamesHoldUpNoOther) {
+TEST(SharedLookup, IsNotDelayedBySixtyThreeNamesWithoutAnswer) {
   ASSERT_EQ(MAX_NAME_LOOKUPS, 64u);
   ResolverStandIn resolver;
   const std::vector<Asking> dead = AskForDeadNames(resolver, 63);
@@ -272,7 +272,7 @@ TEST(SharedLookup, SixtyThreeDeadNamesHoldUpNoOther) {
   }
 }
 
-TEST(SharedLookup, WaitsForAThreadWhenSixtyFourNamesAreDead) {
+TEST(SharedLookup, WaitsForAThreadWhileSixtyFourNamesHaveNoAnswer) {
   ResolverStandIn resolver;
   const std::vector<Asking> dead = AskForDeadNames(resolver, 64);
   const std::vector<Asking> waiting = AskTimes(3, "alive.example");
@@ -287,7 +287,7 @@ TEST(SharedLookup, WaitsForAThreadWhenSixtyFourNamesAreDead) {
   }
 }
 
-TEST(SharedLookup, NeverBeginsWhenAllHaveLeftBeforeItsTurn) {
+TEST(SharedLookup, NeverBeginsWhenAllCallersStopWaitingBeforeItsTurn) {
   ResolverStandIn resolver;
   const std::vector<Asking> dead = AskForDeadNames(resolver, 64);
   std::vector<Asking> leaving = AskTimes(2, "left.example");
@@ -308,7 +308,7 @@ TEST(SharedLookup, NeverBeginsWhenAllHaveLeftBeforeItsTurn) {
   EXPECT_EQ(begun, (Names{"asked-again.example", "last.example"}));
 }
 
-TEST(SharedLookup, OfManyThreadsAnswersEachRequestOnce) {
+TEST(SharedLookup, AnswersEachRequestOfManyThreadsOnce) {
   ResolverStandIn resolver;
   constexpr int THREADS = 64;
   constexpr int ROUNDS = 50;

@@ -109,7 +109,7 @@ TEST(TcpClientSocket, ReadsThePeersOrderlyEndAsZeroBytes) {
 }
 
 TEST(TcpClientSocket, ReportsAResetWithEndpointAndReason) {
-  std::promise<void> connected; // a reset that comes too soon makes the connect fail
+  std::promise<void> connected; // an early reset would make the connect fail
   ScriptedServer server([future = connected.get_future().share()](ServerConnection &connection) {
     future.wait_for(PATIENCE);
     connection.Reset();
@@ -133,8 +133,8 @@ TEST(TcpClientSocket, ReportsARefusedConnection) {
   EXPECT_TRUE(connected.FailedWith<NetworkException>());
 }
 
-TEST(TcpClientSocket, NamesAnIPv6AddressInBrackets) {
-  const Testing::UnusedPort unused; // of 127.0.0.1; nobody listens on ::1 either
+TEST(TcpClientSocket, ReportsAnIPv6AddressInBrackets) {
+  const Testing::UnusedPort unused; // on 127.0.0.1; nothing listens on ::1 either
   const std::string port = std::to_string(unused.GetPort());
   EXPECT_EQ(Connect("::1", unused.GetPort()), "Cannot connect to [::1]:" + port + ": Connection refused");
   EXPECT_EQ(Connect("[::1]", unused.GetPort()), "Cannot connect to [::1]:" + port + ": Connection refused");
@@ -143,7 +143,8 @@ TEST(TcpClientSocket, NamesAnIPv6AddressInBrackets) {
 }
 
 TEST(TcpClientSocket, ReportsAnUnknownHost) {
-  // RFC 1035, section 2.3.4: a label has 63 octets at most, so no name server is asked. The reason is the resolver's own.
+  // RFC 1035, section 2.3.4: a label has at most 63 octets, so no name server is asked. The reason is the resolver's
+  // text.
   const std::string host = std::string(64, 'x') + ".invalid";
   const std::string message = Connect(host, 443);
   EXPECT_EQ(message.rfind("Cannot connect to " + host + ":443: ", 0), 0u) << message;
@@ -160,14 +161,14 @@ TEST(TcpClientSocket, ReportsANameWithoutAddress) {
   EXPECT_EQ(Connect("sts.example", 443), "Cannot connect to sts.example:443: The name has no address");
 }
 
-TEST(TcpClientSocket, RefusesHostsAndPortsThatCannotBe) {
+TEST(TcpClientSocket, RefusesInvalidHostsAndPorts) {
   struct Case {
     std::string host;
     int port;
     std::string reason;
   };
   const std::string notAscii = "the host name is not ASCII (an internationalised name must be in its \"xn--\" form)";
-  const std::string control = "the host name holds a blank or a control character";
+  const std::string control = "the host name contains a blank or a control character";
   const std::string port = "the port is not between 1 and 65535";
   for (const Case &bad : std::vector<Case>{{"", 1, "the host name is empty"},
                                            {"b\xC3\xBC"
@@ -178,13 +179,13 @@ TEST(TcpClientSocket, RefusesHostsAndPortsThatCannotBe) {
                                            {"a", 0, port},
                                            {"a", -1, port},
                                            {"a", 65536, port},
-                                           {"[a.example]", 1, "only an IPv6 address may stand in brackets"}}) {
+                                           {"[a.example]", 1, "only an IPv6 address may be in brackets"}}) {
     EXPECT_EQ(Connect(bad.host, bad.port),
               "Cannot connect to " + bad.host + ":" + std::to_string(bad.port) + ": " + bad.reason);
   }
 }
 
-TEST(TcpClientSocket, RefusesAHostThatHoldsAZero) {
+TEST(TcpClientSocket, RefusesAHostWithAZeroByte) {
   const Ref<TcpClientSocket> socket = CreateTcpClientSocket();
   Completion connected;
   socket->AsyncConnect(std::string("localhost\0.example", 18), 1, connected.ForEnd());
@@ -213,7 +214,7 @@ TEST(TcpClientSocket, ReportsEachAddressThatFailed) {
                 ": ::1: Connection refused; 127.0.0.1: Connection refused");
 }
 
-TEST(TcpClientSocket, GivesUpAnAddressThatNeverAnswersForTheNext) {
+TEST(TcpClientSocket, TriesTheNextAddressWhenOneNeverAnswers) {
   const FullPort full;
   const ScopedNameLookup lookup([](const std::string &) {
     return AddressList{boost::asio::ip::make_address("127.0.0.1"), boost::asio::ip::make_address("127.0.0.2")};
@@ -223,7 +224,7 @@ TEST(TcpClientSocket, GivesUpAnAddressThatNeverAnswersForTheNext) {
                 ": 127.0.0.1: Connection timed out; 127.0.0.2: Connection refused");
 }
 
-TEST(TcpClientSocket, ClosingEndsAConnectThatNobodyAnswers) {
+TEST(TcpClientSocket, ClosingEndsAConnectWithoutAnswer) {
   const FullPort full;
   const Ref<TcpClientSocket> socket = CreateTcpClientSocket();
   ASSERT_TRUE(Testing::DrainIoThreads());
@@ -283,7 +284,7 @@ TEST(TcpClientSocket, ClosingEndsAPendingRead) {
   EXPECT_EQ(read.GetCalls(), 1);
 }
 
-TEST(TcpClientSocket, ClosingEndsAWriteThatThePeerDoesNotTake) {
+TEST(TcpClientSocket, ClosingEndsAWriteThatThePeerDoesNotRead) {
   std::promise<void> done;
   ScriptedServer server([future = done.get_future().share()](ServerConnection &) { future.wait_for(PATIENCE); });
   const Ref<TcpClientSocket> socket = CreateTcpClientSocket();
@@ -326,7 +327,7 @@ TEST(TcpClientSocket, HandlersNeverRunInsideTheStartingCall) {
   }
 }
 
-TEST(TcpClientSocket, AHandlerThatThrowsHarmsNobody) {
+TEST(TcpClientSocket, WorksAfterAHandlerHasThrown) {
   ScriptedServer server(Echo);
   for (int i = 0; i < 10; ++i) {
     CreateTcpClientSocket()->AsyncConnect("127.0.0.1", server.GetPort(), [](const Exception *) { throw 1; });
@@ -351,7 +352,7 @@ TEST(TcpClientSocket, ADescriptorIsNotInherited) {
   EXPECT_EQ(sockets, 1);
 }
 
-TEST(TcpClientSocket, LeavesNoDescriptorAndNoThreadBehind) {
+TEST(TcpClientSocket, LeaksNeitherDescriptorsNorThreads) {
   ScriptedServer server([](ServerConnection &connection) { connection.Stall(); });
   ASSERT_EQ(Connect("localhost", server.GetPort()), ""); // starts the I/O threads
   ASSERT_TRUE(Testing::DrainIoThreads());

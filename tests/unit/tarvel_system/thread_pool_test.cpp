@@ -30,7 +30,7 @@ using Testing::Completion;
 using Testing::Eventually;
 using Testing::PATIENCE;
 
-/// Holds the threads that run `Wait` until `Open`.
+/// Blocks the threads that call `Wait` until `Open` is called.
 class Gate {
 public:
   auto Wait() {
@@ -53,7 +53,7 @@ TEST(ThreadPool, HasAtLeastOneThreadAtTheCeiling) {
   EXPECT_EQ(CreateThreadPool(0)->GetThreadCeiling(), 1u);
 }
 
-TEST(ThreadPool, StartsItemsInTheirOrder) {
+TEST(ThreadPool, StartsItemsInOrder) {
   const Ref<ThreadPool> pool = CreateThreadPool(1);
   std::vector<int> order;
   std::promise<void> last;
@@ -82,7 +82,7 @@ TEST(ThreadPool, AnIdleThreadTakesTheNextItem) {
     const Ref<ScheduledItem> item = pool->QueueWorkItem([] {});
     ASSERT_TRUE(Eventually([&] { return item->IsDone(); }));
   }
-  // An item is done a moment before its thread is idle again, hence perhaps a second thread.
+  // An item is done a moment before its thread is idle again, so there may be a second thread.
   EXPECT_LE(pool->GetThreadCount(), 3u);
 }
 
@@ -174,7 +174,7 @@ TEST(ThreadPool, WorkIsDestroyedBeforeItsItemIsDone) {
   EXPECT_TRUE(watch.expired());
 }
 
-TEST(ThreadPool, DroppingItWaitsForWhatRunsAndDropsWhatIsQueued) {
+TEST(ThreadPool, WaitsForRunningWorkAndDropsTheQueueWhenDestroyed) {
   Ref<ThreadPool> pool = CreateThreadPool(1);
   std::promise<void> begun;
   Gate gate;
@@ -196,7 +196,7 @@ TEST(ThreadPool, DroppingItWaitsForWhatRunsAndDropsWhatIsQueued) {
   EXPECT_FALSE(ran);
 }
 
-TEST(ThreadPool, MayBeDroppedByItsOwnWork) {
+TEST(ThreadPool, MayBeReleasedByItsOwnWork) {
   const std::size_t before = Testing::CountThreads();
   auto pool = std::make_shared<Ref<ThreadPool>>(CreateThreadPool(2));
   std::promise<void> dropped;
@@ -230,7 +230,7 @@ TEST(ThreadPool, ItsThreadsBlockTheSignalsOfTheProcess) {
   EXPECT_EQ(sigismember(&own, SIGINT), 0);
 }
 
-TEST(ThreadPool, TheProcessHasOne) {
+TEST(GetThreadPool, ReturnsTheSamePoolEachTime) {
   EXPECT_EQ(GetThreadPool(), GetThreadPool());
   EXPECT_EQ(GetThreadPool()->GetThreadCeiling(), DEFAULT_THREAD_CEILING);
   std::promise<void> ran;
@@ -238,7 +238,7 @@ TEST(ThreadPool, TheProcessHasOne) {
   EXPECT_EQ(ran.get_future().wait_for(PATIENCE), std::future_status::ready);
 }
 
-/// One exchange over a connection of its own, blocking the calling thread; what was read back, or what went wrong.
+/// One exchange over a new connection, which blocks the calling thread. @return what was read back, or the failure.
 std::string Exchange(int port) {
   const Ref<TcpClientSocket> socket = CreateTcpClientSocket();
   Completion connected;

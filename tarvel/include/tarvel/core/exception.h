@@ -33,11 +33,12 @@ public:
   /// The innermost frame of the call stack that is not the exception's own; empty when unknown.
   virtual std::string Where() const;
 
-  /// A new copy of the same dynamic class. The caller owns it and deletes it; `Copy` returns an owner instead. It may be handed
-  /// to another thread.
+  /// A new copy of the same dynamic class. The caller owns it and deletes it; `Copy` returns an owner instead. It may
+  /// be handed to another thread.
   virtual Exception *Clone() const;
 
-  /// What `Clone` returns, with an owner that deletes it. Use this to keep an exception that is valid only during a call.
+  /// What `Clone` returns, with an owner that deletes it. Use this to keep an exception that is valid only during a
+  /// call.
   std::unique_ptr<Exception> Copy() const;
 
   /// Throws a copy as its own dynamic class, so that a holder of a base reference rethrows the precise type.
@@ -84,9 +85,9 @@ public:
   [[noreturn]] void Throw() const override;
 };
 
-/// An operation on an object that is not in the state for it. Also any operation that needs OpenSSL after OpenSSL has cleaned
-/// itself up, with the message "OpenSSL has cleaned itself up: the process is about to end"; this says nothing about the data
-/// that the operation was given.
+/// An operation on an object that is not in the state for it. Also any operation that needs OpenSSL after OpenSSL has
+/// cleaned itself up, with the message "OpenSSL has cleaned itself up: the process is about to end"; this says nothing
+/// about the data that the operation was given.
 class TARVEL_API InvalidStateException : public Exception {
   TARVEL_EXCEPTION_BODY(InvalidStateException, Exception);
 };
@@ -107,8 +108,8 @@ class TARVEL_API DateTimeFormatException : public Exception {
 };
 
 /// Memory ran out in OpenSSL, in any function that uses it, or after the start of an operation over HTTP or TLS, whose
-/// completion gets this exception. (Elsewhere a call throws `std::bad_alloc`.) It says nothing about the data that was being
-/// read, verified or sent. The message is always "There is not enough memory"; there is no call stack.
+/// completion gets this exception. (Elsewhere a call throws `std::bad_alloc`.) It says nothing about the data that was
+/// being read, verified or sent. The message is always "There is not enough memory"; there is no call stack.
 class TARVEL_API OutOfMemoryException : public Exception {
 public:
   OutOfMemoryException() noexcept = default;

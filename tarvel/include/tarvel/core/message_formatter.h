@@ -12,9 +12,10 @@
 
 namespace Tarvel {
 
-/// One argument of a message, as text. To make a type usable as an argument, define an overload of `FormatMessageArgument` in
-/// its own namespace, which is found by argument-dependent look-up and returns `std::string`. Texts, numbers, Booleans
-/// ("true", "false") and pointers (hexadecimal, "(null)" when null) have theirs already.
+/// One argument of a message, as text. To make a type usable as an argument, define an overload of
+/// `FormatMessageArgument` in its own namespace, which is found by argument-dependent look-up and returns
+/// `std::string`. Texts, numbers, Booleans ("true", "false") and pointers (hexadecimal, "(null)" when null) have theirs
+/// already.
 namespace MessageArguments {
 
 /// The text of an argument of a message.
@@ -56,8 +57,8 @@ class TARVEL_API MessageFormatter {
 public:
   MessageFormatter() = delete;
 
-  /// `format` with %1 to %9 replaced by the arguments in order. A placeholder without an argument stays as it is, "%%" is
-  /// one per cent sign, and placeholders within an argument are not replaced.
+  /// `format` with %1 to %9 replaced by the arguments in order. A placeholder without an argument stays as it is, "%%"
+  /// is one per cent sign, and placeholders within an argument are not replaced.
   template <typename... Args>
   static std::string ASPrint(std::string_view format, const Args &...args) {
     static_assert(sizeof...(Args) <= 9, "a message has the placeholders %1 to %9");

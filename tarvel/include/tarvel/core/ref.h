@@ -40,7 +40,8 @@ private:
 };
 
 /// A counted reference to a `T` that has `AddRef` and `Release` (an `Object`, or a node of an XML tree). May be null.
-/// Copying shares the object, destroying releases it. One `Ref` is for one thread at a time; copies may be used on any thread.
+/// Copying shares the object, destroying releases it. One `Ref` is for one thread at a time; copies may be used on any
+/// thread.
 template <typename T>
 class Ref {
 public:

@@ -12,12 +12,12 @@
 
 namespace Tarvel {
 
-/// A text whose memory is overwritten before it is freed, also when the text grows, is replaced or is moved from. It cannot be
-/// printed, and a plain text never becomes one without a constructor being named. Safe for any number of readers on any threads
-/// while nobody changes it.
+/// A text whose memory is overwritten before it is freed, also when the text grows, is replaced or is moved from. It
+/// cannot be printed, and a plain text becomes one only by an explicit constructor. Any number of threads may read it
+/// while none changes it.
 ///
-/// A copy of what `Get` returns is an ordinary text again, and so is what the text was made from by the first constructor: their
-/// owners overwrite them (`SecureWipe`).
+/// A copy of what `Get` returns is an ordinary text again, and so is the text that a copying constructor reads:
+/// overwrite them with `SecureWipe`.
 class TARVEL_API SecretText {
 public:
   /// The empty text.
@@ -29,7 +29,7 @@ public:
   /// A copy of the null-terminated `text`, which is not null.
   explicit SecretText(const char *text) : m_text(text) {}
 
-  /// Takes over what `text` holds and leaves it empty and overwritten.
+  /// Takes over the content of `text` and leaves `text` empty and overwritten.
   explicit SecretText(std::string &&text) noexcept;
 
   SecretText(const SecretText &other) = default;
@@ -38,13 +38,17 @@ public:
   SecretText &operator=(SecretText &&other) noexcept;
   ~SecretText();
 
-  /// The text, valid until this object changes or goes.
+  /// The text, valid until this object is changed or destroyed.
   const std::string &Get() const noexcept { return m_text; }
 
-  /// Appends `text`, which is not part of this one. Memory that the text outgrows is overwritten.
+  /// Appends `text`, which must not be part of this one. Memory that the text outgrows is overwritten.
   void Append(std::string_view text);
 
-  /// Nothing prints a secret.
+  /// Returns the text, and leaves this one empty and overwritten. The result is an ordinary text, which its owner
+  /// overwrites.
+  std::string Take() noexcept;
+
+  /// A secret cannot be printed.
   friend std::ostream &operator<<(std::ostream &, const SecretText &) = delete;
 
 private:

@@ -13,10 +13,12 @@
 
 namespace Tarvel {
 
-/// Overwrites `length` bytes at `data` with zeros; no compiler optimises this away. `data` may be null when `length` is 0.
+/// Overwrites `length` bytes at `data` with zeros; no compiler optimises this away. `data` may be null when `length` is
+/// 0.
 TARVEL_API void SecureWipe(void *data, std::size_t length) noexcept;
 
-/// Overwrites the text and the rest of its memory, in which an earlier, longer value may remain, and makes the text empty.
+/// Overwrites the text and the rest of its memory, in which an earlier, longer value may remain, and makes the text
+/// empty.
 TARVEL_API void SecureWipe(std::string &text) noexcept;
 
 /// The same for a list of bytes.

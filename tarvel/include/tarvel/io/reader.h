@@ -20,12 +20,13 @@ public:
   virtual std::size_t Read(char *buffer, std::size_t length) = 0;
 
   /// Everything from the current position to the end.
-  /// @param maximumBytes reading stops as soon as it has read more than this; the result is then at least one byte longer.
+  /// @param maximumBytes reading stops as soon as it has read more than this; the result is then at least one byte
+  ///        longer.
   /// @throws IOException when the source fails.
   virtual std::string ReadToEnd(std::size_t maximumBytes);
 
-  /// The charset that the source declares for its bytes, in its own spelling ("windows-1252"); empty when it declares none.
-  /// For messages only: text that the reader can convert to UTF-8 has been converted already.
+  /// The charset that the source declares for its bytes, in its own spelling ("windows-1252"); empty when it declares
+  /// none. For messages only: text that the reader can convert to UTF-8 has been converted already.
   virtual std::string GetDeclaredCharset() const;
 
 protected:

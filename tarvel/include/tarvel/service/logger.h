@@ -22,15 +22,15 @@ struct LogRecord {
   std::string_view message; ///< the text of the line
 };
 
-/// The host's function for one line. Called on the thread that logs, possibly on several at once; an exception that leaves
-/// it is ignored.
+/// The host's function for one line. Called on the thread that logs, possibly on several at once; an exception that
+/// leaves it is ignored.
 using LogSink = std::function<void(const LogRecord &)>;
 
 /// The root of all loggers, which has the host's sink. There is one, in the `App`.
 class TARVEL_API LogRoot : public Object {
 public:
-  /// Installs the sink, which replaces any earlier one; an empty function removes it. Lines that other threads are writing
-  /// at that moment may still reach the earlier sink.
+  /// Installs the sink, which replaces any earlier one; an empty function removes it. Lines that other threads are
+  /// writing at that moment may still reach the earlier sink.
   virtual void SetSink(LogSink sink) = 0;
 
   /// Hands `record` to the sink, if there is one. Never throws.

@@ -16,26 +16,27 @@ namespace Tarvel::System {
 /// The number of microseconds in a second.
 constexpr std::int64_t MICROSECONDS_PER_SECOND = 1'000'000;
 
-/// `seconds` in microseconds, or the nearest `std::int64_t` to that: an absurd number means "always" or "never", and does not
-/// wrap around into its opposite.
+/// `seconds` in microseconds, or the nearest `std::int64_t` to that: an absurd number means "always" or "never", and
+/// does not wrap around into its opposite.
 TARVEL_API std::int64_t SecondsToMicroseconds(std::int64_t seconds) noexcept;
 
-/// A point in time: microseconds since 1970-01-01T00:00:00Z (leap seconds not counted, as in POSIX), from year 1 to year
-/// 9999 of the proleptic Gregorian calendar, together with the zone bias in which its fields are shown. A plain value.
+/// A point in time: microseconds since 1970-01-01T00:00:00Z (leap seconds not counted, as in POSIX), from year 1 to
+/// year 9999 of the proleptic Gregorian calendar, together with the zone bias in which its fields are shown. A plain
+/// value.
 class TARVEL_API DateTime {
 public:
   /// 1970-01-01T00:00:00Z.
   constexpr DateTime() noexcept = default;
 
-  /// The date-time written in `text`, of the form xsd:dateTime (XML Schema 1.0, part 2, section 3.2.7): four-digit year,
-  /// any number of fraction digits (all after the sixth are ignored), zone "Z", "+hh:mm", "-hh:mm" up to 14 hours, or none,
-  /// which means UTC. 24:00:00 is the next day's start. No white space around it. The fields are shown in the zone of the
-  /// text.
+  /// The date-time written in `text`, of the form xsd:dateTime (XML Schema 1.0, part 2, section 3.2.7): four-digit
+  /// year, any number of fraction digits (all after the sixth are ignored), zone "Z", "+hh:mm", "-hh:mm" up to 14
+  /// hours, or none, which means UTC. 24:00:00 is the next day's start. No white space around it. The fields are shown
+  /// in the zone of the text.
   /// @throws DateTimeFormatException when the text has another form or a field is out of range.
   explicit DateTime(std::string_view text);
 
-  /// `time`, shown in UTC: rounded down to a microsecond, and outside the years 1 to 9999 the nearest point inside. `Duration`
-  /// is any `std::chrono::duration`; of a floating-point one, "not a number" is the start of year 1.
+  /// `time`, shown in UTC: rounded down to a microsecond, and outside the years 1 to 9999 the nearest point inside.
+  /// `Duration` is any `std::chrono::duration`; of a floating-point one, "not a number" is the start of year 1.
   template <typename Duration>
   static DateTime FromTimePoint(std::chrono::time_point<std::chrono::system_clock, Duration> time);
 
@@ -54,8 +55,8 @@ public:
     return m_utcMicroseconds - other.m_utcMicroseconds;
   }
 
-  /// The point so much later, or earlier for a negative number; outside the years 1 to 9999 the nearest point inside (it
-  /// saturates). The bias stays, except where a field would leave these years: there it is 0.
+  /// The point so much later, or earlier for a negative number; outside the years 1 to 9999 the nearest point inside
+  /// (it saturates). The bias stays, except where a field would leave these years: there it is 0.
   DateTime PlusMicroseconds(std::int64_t microseconds) const noexcept;
   DateTime PlusSeconds(std::int64_t seconds) const noexcept;
 
@@ -75,7 +76,8 @@ public:
   /// "Z" for a zero bias, else the offset as "+hh:mm" or "-hh:mm".
   std::string ToShortStringBias() const;
 
-  /// The platform's own text form: xsd:dateTime with three fraction digits and the zone, such as 2013-05-07T09:03:01.042Z.
+  /// The platform's own text form: xsd:dateTime with three fraction digits and the zone, such as
+  /// 2013-05-07T09:03:01.042Z.
   std::string ToString() const;
 
   /// Values are compared by their points in time; the bias is ignored.

@@ -13,11 +13,11 @@ namespace Tarvel::System {
 /// stop the work. Safe on any thread.
 class TARVEL_API ScheduledItem : public Object {
 public:
-  /// Asks the work to stop. What has not begun never begins; a pending operation completes soon, with an exception;
-  /// what is done stays done. May be called any number of times. Does not wait.
+  /// Asks the work to stop. Work that has not begun never begins; a pending operation completes soon, with an
+  /// exception; work that is done stays done. May be called any number of times. Does not wait.
   virtual void Cancel() noexcept = 0;
 
-  /// Whether the work has ended, by whatever way; in a child process, whether it ended there or is the parent's.
+  /// Whether the work has ended, in any way; in a child process, whether it ended there or is the parent's.
   virtual bool IsDone() const noexcept = 0;
 
 protected:

@@ -21,36 +21,38 @@ class TARVEL_API NetworkException : public Exception {
   TARVEL_EXCEPTION_BODY(NetworkException, Exception);
 };
 
-/// A time-out of an operation that was waited for.
+/// An operation that was waited for did not end in time.
 class TARVEL_API TimeoutException : public NetworkException {
   TARVEL_EXCEPTION_BODY(TimeoutException, NetworkException);
 };
 
 /// A connected stream of bytes, driven asynchronously. A completion is called exactly once for each start that returns,
-/// whatever goes wrong, and never inside the starting call (though perhaps before it has returned). A start throws
-/// `std::bad_alloc` when there is no memory to begin with, and, in a child process made by `fork`, `InvalidStateException` when
-/// the I/O threads get no thread or descriptor; nothing else. Its completion is not called then.
+/// whatever goes wrong, and never inside the starting call (though perhaps before it has returned). A start throws only
+/// `std::bad_alloc`, when there is no memory to begin, and, in a child process made by `fork`, `InvalidStateException`,
+/// when no thread or descriptor is left for the I/O threads. Its completion is not called then.
 ///
-/// Completions run on the platform's I/O threads, of which all that is pending in the process shares two. They must not
-/// block, nor wait for another operation, synchronous or asynchronous: start the next one from the completion, and queue
-/// work that takes time on a thread pool. What a completion throws is logged (logger "Tarvel", level 8) and goes no further.
+/// Completions run on the platform's I/O threads: there are two, and all pending operations of the process share them.
+/// A completion must not block, nor wait for another operation, synchronous or asynchronous: start the next one from
+/// the completion, and queue work that takes time on a thread pool. An exception that a completion throws is logged
+/// (logger "Tarvel", level 8) and goes no further.
 ///
-/// At most one read and one write may be pending at a time. Buffers belong to the caller and must stay until the
-/// completion. Any thread may start and close.
+/// At most one read and one write may be pending at a time. Buffers belong to the caller and must stay valid until the
+/// completion. Any thread may start operations and close the stream.
 ///
-/// A child process made by `fork` closes its copy of the connection and sends nothing over it. No completion of an operation
-/// that the parent has begun is called there; what the child begins on such a stream fails.
+/// A child process made by `fork` closes its copy of the connection and sends nothing over it. No completion of an
+/// operation that the parent has begun is called there; what the child begins on such a stream fails.
 class TARVEL_API Stream : public Object {
 public:
-  /// Called with the number of bytes moved and null, or with what went wrong, which is valid during the call: a
-  /// `NetworkException` (also when memory runs out on the way), over TLS its `Ssl::SSLException`;
-  /// `InvalidArgumentException` or `InvalidStateException` for a read of no bytes and, over TLS, for a second read or write
-  /// while one is pending, for one before the handshake, and for one on a connection that is the parent process's. Over TLS
-  /// also an `InvalidStateException` when OpenSSL has cleaned itself up because the process ends, at once whatever the peer
-  /// does, and an `OutOfMemoryException`; either ends the connection.
+  /// Called with the number of bytes moved and null, or with the failure, which is valid during the call:
+  /// - a `NetworkException` (also when memory runs out on the way); over TLS its subclass `Ssl::SSLException`;
+  /// - an `InvalidArgumentException` or `InvalidStateException` for a read of no bytes and, over TLS, for a second read
+  ///   or write while one is pending, for one before the handshake, and for one on a connection of the parent process;
+  /// - over TLS, an `InvalidStateException` when OpenSSL has cleaned itself up because the process ends, at once
+  ///   whatever the peer does, or an `OutOfMemoryException`; either ends the connection.
   using TransferHandler = std::function<void(std::size_t, const Exception *)>;
 
-  /// Reads at least one byte, at most `length`; 0 bytes and no exception mean the peer's orderly end.
+  /// Reads at least one byte, at most `length`; 0 bytes without an exception mean that the peer has closed its side
+  /// orderly.
   virtual void AsyncReadSome(char *buffer, std::size_t length, TransferHandler handler) = 0;
 
   /// Writes all `length` bytes.
@@ -69,21 +71,22 @@ protected:
   ~Stream() override;
 };
 
-/// How many host names are looked up at a time. Nothing can interrupt the system's resolver, so that a name that gets no
-/// answer holds one of these places until the resolver gives up, however many connections ask for it: look-ups of one name
-/// at the same time are one, in whatever letter case. Up to 63 such names hold up no other.
+/// How many host names are looked up at a time. The system's resolver cannot be interrupted, so a name without an
+/// answer occupies one of these places until the resolver gives up. Simultaneous look-ups of one name, in any letter
+/// case, share one place. Up to 63 such names delay no other.
 constexpr std::size_t MAX_NAME_LOOKUPS = 64;
 
 /// A TCP connection to be made.
 class TARVEL_API TcpClientSocket : public Stream {
 public:
-  /// Called with null, or with what went wrong, which is valid during the call: a `NetworkException` (also when no
-  /// descriptor, thread or memory is left), or an `InvalidStateException` for a socket that has been used or closed already.
+  /// Called with null, or with the failure, which is valid during the call: a `NetworkException` (also when no
+  /// descriptor, thread or memory is left), or an `InvalidStateException` for a socket that has been used or closed
+  /// already.
   using ConnectHandler = std::function<void(const Exception *)>;
 
-  /// Resolves `host` (a name, or an IPv4 or IPv6 address, this one with or without brackets) and connects, trying each
-  /// address in the resolver's order until one answers. Names that are not ASCII are refused, and ports outside 1 to
-  /// 65535, by a `NetworkException` to the handler. A look-up of the name that is under way is joined; when
+  /// Resolves `host` (a name, an IPv4 address, or an IPv6 address with or without brackets) and connects: tries each
+  /// address in the resolver's order until one answers. A name that is not ASCII and a port outside 1 to 65535 are
+  /// refused, with a `NetworkException` to the handler. A look-up of the name that is under way is joined; when
   /// `MAX_NAME_LOOKUPS` other names are being looked up, it waits for its turn. `Close` ends the wait, not the look-up.
   /// No result is kept for later connections.
   virtual void AsyncConnect(const std::string &host, int port, ConnectHandler handler) = 0;
@@ -93,8 +96,8 @@ protected:
 };
 
 /// A socket, not connected. Its completions run on the platform's I/O threads.
-/// @throws InvalidStateException when these cannot be started, or no descriptor is left for what they wait on. Only the
-///         first sockets of a process can meet that; a later call tries again.
+/// @throws InvalidStateException when these cannot be started, or no descriptor is left for them to wait on. Only the
+///         first sockets of a process can fail so; a later call tries again.
 TARVEL_API Ref<TcpClientSocket> CreateTcpClientSocket();
 
 /// A handle that cancels by closing `stream`.

@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// Thread pools for the life of the process.
+/// Thread pools that are never destroyed.
 
 #pragma once
 
@@ -8,8 +8,8 @@
 
 namespace Tarvel::System {
 
-/// A pool that is never to be destroyed: nobody will ever wait for its threads, so each is let go when it retires. The
-/// caller keeps a reference for good.
+/// A pool that lives until the process ends. Its threads are never joined; each is detached when it retires. The caller
+/// never releases the reference.
 Ref<ThreadPool> CreateEndlessThreadPool(std::size_t threadCeiling, std::chrono::milliseconds idleTime);
 
 } // namespace Tarvel::System
