@@ -22,8 +22,8 @@ constexpr std::size_t DigestBytes(DigestAlgorithm algorithm) noexcept {
   return algorithm == DigestAlgorithm::SHA256 ? 32 : algorithm == DigestAlgorithm::SHA384 ? 48 : 64;
 }
 
-/// A digest that is being computed. For one thread, and only as a local variable: every other use of OpenSSL that the thread
-/// begins after this one must end before it.
+/// A digest that is being computed. For one thread, and only as a local variable: another use of OpenSSL that the thread
+/// begins during its life must also end during its life.
 class Digest {
 public:
   /// @throws CryptoException when the cryptographic library does not offer the algorithm; InvalidStateException when it has

@@ -58,7 +58,7 @@ void InitialiseOpenSsl() {
   const std::uint64_t configurationFlag = isOfSystem ? OPENSSL_INIT_LOAD_CONFIG : OPENSSL_INIT_NO_LOAD_CONFIG;
   // OpenSSL reads its configuration with the first context for TLS, unless a flag forbids it. Only the first such flag
   // in a process has an effect.
-  const bool isUsable = OPENSSL_init_crypto(0, nullptr) == 1; // not after its clean-up, or without memory
+  const bool isUsable = OPENSSL_init_crypto(0, nullptr) == 1; // false after its clean-up, or without memory
   if (!isUsable || OPENSSL_init_ssl(configurationFlag, nullptr) != 1) {
     static std::atomic<bool> lackedMemory{false}; // OpenSSL does not retry what has failed once
     lackedMemory = lackedMemory || errors.RanOutOfMemory();

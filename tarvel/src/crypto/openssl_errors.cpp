@@ -40,7 +40,7 @@ OpenSslErrorScope::OpenSslErrorScope() noexcept : m_errnoOfHost(errno) {
 
 // In an empty queue OpenSSL sets no mark; popping to the mark then empties the queue, which is the state to restore.
 OpenSslErrorScope::~OpenSslErrorScope() {
-  const bool ranOut = errno == ENOMEM; // for a scope around this one
+  const bool ranOut = errno == ENOMEM; // stays visible to an enclosing scope
   ERR_pop_to_mark();
   errno = ranOut ? ENOMEM : m_errnoOfHost;
 }

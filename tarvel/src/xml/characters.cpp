@@ -46,7 +46,7 @@ std::uint32_t Byte(std::string_view text, std::size_t offset) noexcept {
 
 /// The offset of the first byte above 0x7F, or `npos`.
 std::size_t FindNonAscii(std::string_view text) noexcept {
-  constexpr std::size_t BLOCK = 64; // enough for a short loop, and few enough to search byte by byte
+  constexpr std::size_t BLOCK = 64; // long enough for a fast loop, short enough to search byte by byte
   constexpr std::uint64_t HIGH_BITS = 0x8080808080808080u;
   std::size_t offset = 0;
   for (; text.size() - offset >= BLOCK; offset += BLOCK) {

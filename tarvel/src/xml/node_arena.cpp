@@ -22,8 +22,8 @@ constexpr std::size_t RoundUp(std::size_t size, std::size_t alignment) noexcept 
 
 // The arena and its first memory are one allocation, so a node made alone costs only that one.
 NodeArena *NodeArena::Create(std::size_t firstBytes, AfterUse afterUse) {
-  const std::size_t room = RoundUp(firstBytes, ALIGNMENT);
-  return new (::operator new(sizeof(NodeArena) + room)) NodeArena(room, afterUse);
+  const std::size_t capacity = RoundUp(firstBytes, ALIGNMENT);
+  return new (::operator new(sizeof(NodeArena) + capacity)) NodeArena(capacity, afterUse);
 }
 
 NodeArena::NodeArena(std::size_t firstBytes, AfterUse afterUse) noexcept
@@ -113,9 +113,9 @@ char *NodeArena::AllocateText(std::size_t size) {
 }
 
 void NodeArena::AddBlock(std::size_t size) {
-  const std::size_t room = std::max(size, m_nextBlockBytes);
-  m_free = AllocateBlock(room);
-  m_end = m_free + room;
+  const std::size_t capacity = std::max(size, m_nextBlockBytes);
+  m_free = AllocateBlock(capacity);
+  m_end = m_free + capacity;
   m_nextBlockBytes = std::min(2 * m_nextBlockBytes, LARGEST_BLOCK_BYTES);
 }
 

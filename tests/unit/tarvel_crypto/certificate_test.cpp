@@ -162,7 +162,7 @@ TEST(CreateCertificateFromPem, RefusesTextWithoutACertificate) {
   }
 }
 
-TEST(CreateCertificateFromPem, TakesTheFirstOfSeveral) {
+TEST(CreateCertificateFromPem, ReturnsTheFirstOfSeveral) {
   EXPECT_EQ(CreateCertificateFromPem(ReadFixture("bundle.pem"))->GetSubject(), "CN=rsa2048,O=Example");
 }
 

@@ -67,7 +67,7 @@ TEST_F(TrustSetKeyResolver, SelectsAllTrustedCertificatesThatKeyInfoContains) {
                                    X509(Base64Of("sts-ec256"))));
 }
 
-TEST_F(TrustSetKeyResolver, NeverTakesACertificateFromTheMessage) {
+TEST_F(TrustSetKeyResolver, NeverReturnsACertificateFromTheMessage) {
   EXPECT_EQ(m_trusted, Resolve(m_trusted, X509(Base64Of("other"))));
   EXPECT_TRUE(Resolve({}, X509(Base64Of("other"))).empty());
 }

@@ -70,7 +70,7 @@ TEST(Node, IsComposedAndFreedInADepthOfAHundredThousandWithoutRecursion) {
   EXPECT_EQ(WriteElement(*top).size(), std::size_t{DEPTH} * 7);
 }
 
-TEST(Node, TakesAHundredThousandChildrenInLinearTime) {
+TEST(Node, AcceptsAHundredThousandChildrenInLinearTime) {
   const Ref<ElementNode> top = MakeElement("a");
   for (int i = 0; i < 100'000; ++i) {
     top->AppendChild(MakeElement("b").get());

@@ -70,7 +70,7 @@ TEST(CreateElementNode, AcceptsEveryKindOfNameCharacter) {
   }
 }
 
-TEST(CreateTextNode, MakesAnEmptyTextThatTakesValues) {
+TEST(CreateTextNode, MakesAnEmptyTextThatAcceptsValues) {
   Ref<TextNode> text;
   CreateTextNode(text);
   EXPECT_EQ(text->GetValue(), "");

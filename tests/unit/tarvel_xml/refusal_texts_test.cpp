@@ -288,6 +288,9 @@ TEST(Refusals, ReportTheFirstAttributeWithTheNamespaceAndLocalNameOfAnother) {
                           XMLParseException,
                           "the attributes 'q:y' and 'r:y' have the same local name in the same namespace at line 2, "
                           "column 15");
+    EXPECT_THROWS_MESSAGE(ParseDocument(start + "\nq:y='' p:y='' s:y='' r:y=''/>"), XMLParseException,
+                          "the attributes 'p:y' and 's:y' have the same local name in the same namespace at line 2, "
+                          "column 15");
   }
 }
 

@@ -8,9 +8,9 @@
 
 namespace Tarvel::Crypto {
 
-/// From now on, certificates, keys, signatures and TLS use OpenSSL as the machine has configured it: `openssl.cnf`, or the
-/// file in the environment variable OPENSSL_CONF, with its providers (FIPS, PKCS#11, TPM), its properties and its TLS settings.
-/// Without this call, that configuration is neither read nor applied, even if the host has loaded it.
+/// From now on, certificates, keys, signatures and TLS use OpenSSL as the machine has configured it: by `openssl.cnf`, or by
+/// the file that the environment variable OPENSSL_CONF refers to, with its providers (FIPS, PKCS#11, TPM), its properties and
+/// its TLS settings. Without this call, that configuration is neither read nor applied, even if the host has loaded it.
 ///
 /// TLS then offers what both the machine and this library allow: the machine may set a higher minimum version, a higher
 /// security level or a shorter list of cipher suites; TLS 1.2, level 2 and forward secrecy remain required.

@@ -1,5 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
-// Blank signatures, to be filled and signed.
+// Blank signatures, and signing them.
 
 #include "crypto/public_key.h"
 #include "xml/security/canonical_digest.h"

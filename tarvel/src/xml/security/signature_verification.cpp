@@ -1,5 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
-// Signatures taken from a tree, and their verification.
+// Signatures read from a tree, and their verification.
 
 #include "crypto/public_key.h"
 #include "xml/security/canonical_digest.h"
