@@ -32,11 +32,11 @@ void Parse(const std::string &text) {
   ParseSamlAssertionElement(iterator, assertion);
 }
 
-void ExpectRefusals(const std::string &valid, const std::vector<Refusal> &refusals) {
-  ASSERT_NO_THROW(Parse(valid));
+void ExpectRefusals(const std::string &base, const std::vector<Refusal> &refusals) {
+  ASSERT_NO_THROW(Parse(base));
   for (const Refusal &refusal : refusals) {
     SCOPED_TRACE("replaced " + refusal.from + "\nby " + refusal.to);
-    EXPECT_THROWS_MESSAGE(Parse(ReplaceOnce(valid, refusal.from, refusal.to)), ParseException, refusal.message);
+    EXPECT_THROWS_MESSAGE(Parse(ReplaceOnce(base, refusal.from, refusal.to)), ParseException, refusal.message);
   }
 }
 
@@ -225,9 +225,9 @@ TEST(AssertionRefusals, HolderOfKeyData) {
   const std::string type = " xsi:type=\"saml:KeyInfoConfirmationDataType\"";
   const std::string end = "</saml:SubjectConfirmationData>";
   const std::string where = "Element saml:SubjectConfirmationDataat 1,";
-  const std::string valid = HolderOfKeyAssertion();
-  const std::size_t column = valid.find("<saml:SubjectConfirmationData") + 1;
-  ExpectRefusals(valid, {
+  const std::string base = HolderOfKeyAssertion();
+  const std::size_t column = base.find("<saml:SubjectConfirmationData") + 1;
+  ExpectRefusals(base, {
                            {type, "",
                             "Node 'saml:SubjectConfirmationData is missing required attribute "
                             "'{http://www.w3.org/2001/XMLSchema-instance}type'"},
@@ -344,9 +344,9 @@ TEST(AssertionRefusals, UnknownAndDuplicateRestrictions) {
 }
 
 TEST(AssertionRefusals, ConditionWhoseTypeUsesAnUndefinedPrefix) {
-  const std::string valid = BearerAssertion();
-  const std::size_t column = valid.find("<saml:ProxyRestriction") + 1;
-  ExpectRefusals(valid, {{Piece::PROXY_RESTRICTION, "<saml:Condition xsi:type=\"p:T\"/>",
+  const std::string base = BearerAssertion();
+  const std::size_t column = base.find("<saml:ProxyRestriction") + 1;
+  ExpectRefusals(base, {{Piece::PROXY_RESTRICTION, "<saml:Condition xsi:type=\"p:T\"/>",
                          "Element saml:Conditionat 1," + std::to_string(column) + " uses undefined prefix: `p'"}});
 }
 
