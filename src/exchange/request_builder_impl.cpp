@@ -51,7 +51,7 @@ void RequestBuilderImpl::BuildUserPassTokenRequest(const std::string &username, 
   const XMLBuilderPtr header = SecurityHeaderWith(WsseUsernameTokenBuilder(username, password));
   const XMLBuilderPtr body = AcquireSecurityTokenBuilder(GetEffectiveConfirmationType(spec.confirmation), spec);
   request.soapAction = Request::ISSUE;
-  // On purpose, the body depends on the spec's own confirmation, but the signature on that which a delegate overrides.
+  // On purpose, a delegate overrides the confirmation for the signature, but not for the body.
   SetBody(request, BuildTokenRequest(ConfOverrideWithDelegate(spec), header, body));
 }
 

@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// What each operation takes out of the SOAP body of its response.
+/// Extracts the result of each operation from the SOAP body of its response.
 ///
 /// Elements are found by local name: the namespace is ignored, and the first element of a name is used. All functions throw
 /// `SsoException` when an element that they need is missing.

@@ -9,7 +9,7 @@ namespace SsoClient {
 
 namespace {
 
-/// The form of a name or a domain in which letter case makes no difference.
+/// The form in which names and domains are compared, so that letter case is ignored.
 std::string FoldCase(const std::string &text) {
   return Tarvel::StringUtil::ToUpper(text);
 }
@@ -44,7 +44,7 @@ std::string FormatMessageArgument(const PrincipalId *principal) {
 } // namespace SsoClient
 
 std::size_t std::hash<SsoClient::PrincipalId>::operator()(const SsoClient::PrincipalId &principal) const {
-  // The product with an odd number makes the two parts differ in weight: swapping name and domain changes the hash.
+  // One part is multiplied, so that swapping name and domain changes the hash.
   constexpr std::size_t ODD = 31;
   const std::hash<std::string> hashOf;
   return hashOf(SsoClient::FoldCase(principal.name)) * ODD + hashOf(SsoClient::FoldCase(principal.domain));

@@ -34,7 +34,7 @@ public:
   virtual void SendRequest(const Request &request, Tarvel::Ref<Tarvel::Reader> &response) = 0;
 
   /// Posts the request without waiting; `item` cancels it. `completion` runs on an I/O thread, where it must neither block nor
-  /// wait for another request. The product calls only `SendRequest`; this is part of the interface all the same.
+  /// wait for another request. The product itself calls only `SendRequest`.
   virtual void SendRequestAsync(const Request &request, const Completion &completion,
                                 Tarvel::Ref<Tarvel::System::ScheduledItem> &item) = 0;
 

@@ -33,7 +33,7 @@ constexpr QNameView LocalName(std::string_view name) noexcept {
   return {std::string_view(), name};
 }
 
-/// The name of the attribute that says of which type an element is.
+/// The name of the attribute that states the type of an element.
 constexpr QNameView XSI_TYPE(Namespaces::XSI, "type");
 
 /// Reads a name with or without prefix. Prefixes are resolved by the namespace declarations in scope at `element`; the

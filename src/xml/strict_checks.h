@@ -2,7 +2,7 @@
 /// @file
 /// The checks with which the assertion parser refuses all that it does not know.
 ///
-/// Each throws a `ParseException` that contains the name of the element, and then has changed nothing. Checks of content use
+/// Each throws a `ParseException` with the name of the element, and does not change its arguments then. Checks of content use
 /// the cursor, so they ignore comments, and white space between nodes.
 
 #pragma once

@@ -32,11 +32,11 @@ void Parse(const std::string &text) {
   ParseSamlAssertionElement(iterator, assertion);
 }
 
-void ExpectRefusals(const std::string &valid, const std::vector<Refusal> &refusals) {
-  ASSERT_NO_THROW(Parse(valid));
+void ExpectRefusals(const std::string &base, const std::vector<Refusal> &refusals) {
+  ASSERT_NO_THROW(Parse(base));
   for (const Refusal &refusal : refusals) {
     SCOPED_TRACE("replaced " + refusal.from + "\nby " + refusal.to);
-    EXPECT_THROWS_MESSAGE(Parse(ReplaceOnce(valid, refusal.from, refusal.to)), ParseException, refusal.message);
+    EXPECT_THROWS_MESSAGE(Parse(ReplaceOnce(base, refusal.from, refusal.to)), ParseException, refusal.message);
   }
 }
 
@@ -225,35 +225,35 @@ TEST(AssertionRefusals, HolderOfKeyData) {
   const std::string type = " xsi:type=\"saml:KeyInfoConfirmationDataType\"";
   const std::string end = "</saml:SubjectConfirmationData>";
   const std::string where = "Element saml:SubjectConfirmationDataat 1,";
-  const std::string valid = HolderOfKeyAssertion();
-  const std::size_t column = valid.find("<saml:SubjectConfirmationData") + 1;
-  ExpectRefusals(valid, {
-                            {type, "",
-                             "Node 'saml:SubjectConfirmationData is missing required attribute "
-                             "'{http://www.w3.org/2001/XMLSchema-instance}type'"},
-                            {type, " type=\"saml:KeyInfoConfirmationDataType\"",
-                             "Unexpected attribute 'type' on element 'saml:SubjectConfirmationData'"},
-                            {type, type + " NotOnOrAfter=\"2026-01-01T08:00:00Z\"",
-                             "Unexpected attribute 'NotOnOrAfter' on element 'saml:SubjectConfirmationData'"},
-                            {type, type + " saml:NotOnOrAfter=\"\"",
-                             "Unexpected attribute '{urn:oasis:names:tc:SAML:2.0:assertion}NotOnOrAfter' on element "
-                             "'saml:SubjectConfirmationData'"},
-                            {type, " xsi:type=\"p:KeyInfoConfirmationDataType\"",
-                             where + std::to_string(column) + " uses undefined prefix: `p'"},
-                            {type, " p:type=\"saml:KeyInfoConfirmationDataType\"",
-                             where + std::to_string(column) + " uses undefined prefix: `p'"},
-                            {type, " xsi:type=\"saml:SubjectConfirmationDataType\"",
-                             "Invalid SubjectConfirmationData type: 'saml:SubjectConfirmationDataType'"},
-                            {type, " xsi:type=\"KeyInfoConfirmationDataType\"",
-                             "Invalid SubjectConfirmationData type: 'KeyInfoConfirmationDataType'"},
-                            {type, " xsi:type=\"\"", "Invalid SubjectConfirmationData type: ''"},
-                            {end, "<ds:KeyInfo/>" + end, "Unexpected elements after SubjectConfirmationData/KeyInfo"},
-                            {end, "text" + end, "Unexpected elements after SubjectConfirmationData/KeyInfo"},
-                            {end, end + "<saml:NameID/>", "Unexpected elements after SubjectConfirmationData"},
-                            {"<ds:KeyInfo>", "<saml:Extra/><ds:KeyInfo>", NotFound("KeyInfo")},
-                            {"<saml:SubjectConfirmationData", "<saml:SubjectConfirmationData xmlns:saml=\"urn:other\"",
-                             "Element 'saml:SubjectConfirmationData' has unexpected namespace"},
-                        });
+  const std::string base = HolderOfKeyAssertion();
+  const std::size_t column = base.find("<saml:SubjectConfirmationData") + 1;
+  ExpectRefusals(base, {
+                           {type, "",
+                            "Node 'saml:SubjectConfirmationData is missing required attribute "
+                            "'{http://www.w3.org/2001/XMLSchema-instance}type'"},
+                           {type, " type=\"saml:KeyInfoConfirmationDataType\"",
+                            "Unexpected attribute 'type' on element 'saml:SubjectConfirmationData'"},
+                           {type, type + " NotOnOrAfter=\"2026-01-01T08:00:00Z\"",
+                            "Unexpected attribute 'NotOnOrAfter' on element 'saml:SubjectConfirmationData'"},
+                           {type, type + " saml:NotOnOrAfter=\"\"",
+                            "Unexpected attribute '{urn:oasis:names:tc:SAML:2.0:assertion}NotOnOrAfter' on element "
+                            "'saml:SubjectConfirmationData'"},
+                           {type, " xsi:type=\"p:KeyInfoConfirmationDataType\"",
+                            where + std::to_string(column) + " uses undefined prefix: `p'"},
+                           {type, " p:type=\"saml:KeyInfoConfirmationDataType\"",
+                            where + std::to_string(column) + " uses undefined prefix: `p'"},
+                           {type, " xsi:type=\"saml:SubjectConfirmationDataType\"",
+                            "Invalid SubjectConfirmationData type: 'saml:SubjectConfirmationDataType'"},
+                           {type, " xsi:type=\"KeyInfoConfirmationDataType\"",
+                            "Invalid SubjectConfirmationData type: 'KeyInfoConfirmationDataType'"},
+                           {type, " xsi:type=\"\"", "Invalid SubjectConfirmationData type: ''"},
+                           {end, "<ds:KeyInfo/>" + end, "Unexpected elements after SubjectConfirmationData/KeyInfo"},
+                           {end, "text" + end, "Unexpected elements after SubjectConfirmationData/KeyInfo"},
+                           {end, end + "<saml:NameID/>", "Unexpected elements after SubjectConfirmationData"},
+                           {"<ds:KeyInfo>", "<saml:Extra/><ds:KeyInfo>", NotFound("KeyInfo")},
+                           {"<saml:SubjectConfirmationData", "<saml:SubjectConfirmationData xmlns:saml=\"urn:other\"",
+                            "Element 'saml:SubjectConfirmationData' has unexpected namespace"},
+                       });
 }
 
 TEST(AssertionRefusals, KeyInfoOfHolderOfKey) {
@@ -344,10 +344,10 @@ TEST(AssertionRefusals, UnknownAndDuplicateRestrictions) {
 }
 
 TEST(AssertionRefusals, ConditionWhoseTypeUsesAnUndefinedPrefix) {
-  const std::string valid = BearerAssertion();
-  const std::size_t column = valid.find("<saml:ProxyRestriction") + 1;
-  ExpectRefusals(valid, {{Piece::PROXY_RESTRICTION, "<saml:Condition xsi:type=\"p:T\"/>",
-                          "Element saml:Conditionat 1," + std::to_string(column) + " uses undefined prefix: `p'"}});
+  const std::string base = BearerAssertion();
+  const std::size_t column = base.find("<saml:ProxyRestriction") + 1;
+  ExpectRefusals(base, {{Piece::PROXY_RESTRICTION, "<saml:Condition xsi:type=\"p:T\"/>",
+                         "Element saml:Conditionat 1," + std::to_string(column) + " uses undefined prefix: `p'"}});
 }
 
 TEST(AssertionRefusals, DelegationRestriction) {
