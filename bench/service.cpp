@@ -29,7 +29,7 @@ namespace {
 
 const std::string USER = "alice@corp.example";
 const std::string PASSWORD = "wonderland";
-constexpr int THREAD_COUNTS[] = {1, 2, 4, 16};
+constexpr int THREAD_COUNTS[] = {1, 2, 4, 8, 16};
 
 SsoClient::TokenSpec Spec() {
   SsoClient::TokenSpec spec;

@@ -27,17 +27,28 @@ namespace {
 const std::string CERTIFICATE_FILE = TOKEN_DATA_DIR "/sts-rsa.crt";
 const std::string KEY_FILE = TOKEN_DATA_DIR "/sts-rsa.key";
 
-/// The tokens, read once. All are signed with the RSA-2048 key of `CERTIFICATE_FILE`, SHA-256 and exclusive C14N.
-struct Tokens {
-  const std::string small = ReadFile(TOKEN_DATA_DIR "/bearer-5k.xml");
-  const std::string medium = ReadFile(TOKEN_DATA_DIR "/bearer-50k.xml");
-  const std::string large = ReadFile(LARGE_TOKEN);
+/// A token, signed with the RSA-2048 key of `CERTIFICATE_FILE`, SHA-256 and exclusive C14N.
+struct Token {
+  std::string size; // "5k"
+  std::string xml;
 };
 
-const Tokens &GetTokens() {
-  static const Tokens tokens;
+/// By size, the smallest first. Those above 50 KB have the same groups more often.
+const std::vector<Token> &GetTokens() {
+  static const std::vector<Token> tokens{
+      {"2k", ReadFile(TOKEN_DATA_DIR "/bearer-minimal.xml")}, {"5k", ReadFile(TOKEN_DATA_DIR "/bearer-5k.xml")},
+      {"50k", ReadFile(TOKEN_DATA_DIR "/bearer-50k.xml")},    {"150k", ReadFile(LARGE_TOKEN_DIR "/bearer-150k.xml")},
+      {"500k", ReadFile(LARGE_TOKEN_DIR "/bearer-500k.xml")}, {"1500k", ReadFile(LARGE_TOKEN_DIR "/bearer-1500k.xml")},
+      {"5m", ReadFile(LARGE_TOKEN_DIR "/bearer-5m.xml")}};
   return tokens;
 }
+
+/// The token of 5 KB, whose verification is compared with its peers.
+const std::string &GetSmallToken() {
+  return GetTokens()[1].xml;
+}
+
+constexpr int THREAD_COUNTS[] = {1, 2, 4, 8, 16};
 
 const Tarvel::Crypto::CertificateList &GetTrusted() {
   static const Tarvel::Crypto::CertificateList trusted = Tarvel::Crypto::LoadCertificates(CERTIFICATE_FILE);
@@ -131,26 +142,47 @@ void CheckLimit(benchmark::State &state, const std::string &xml) {
 }
 
 void RegisterBenchmarks() {
-  const Tokens &tokens = GetTokens();
-  const auto add = [](const char *name, auto function, const std::string &xml) {
-    return benchmark::RegisterBenchmark(name, function, xml)->Unit(benchmark::kMicrosecond);
+  const auto add = [](const std::string &name, auto function, const std::string &xml) {
+    return benchmark::RegisterBenchmark(name.c_str(), function, xml)->Unit(benchmark::kMicrosecond);
   };
-  add("Limit/5k", CheckLimit, tokens.small);
-  add("CreateSamlToken/5k", VerifyByUs, tokens.small);
-  add("xmlsec1/5k", VerifyByXmlsec, tokens.small);
-  add("Limit/50k", CheckLimit, tokens.medium);
-  add("CreateSamlToken/50k", VerifyByUs, tokens.medium);
-  add("CreateSamlToken/5m", VerifyByUs, tokens.large);
-  for (const int threads : {1, 2}) {
-    add("Limit/scaling", CheckLimit, tokens.small)->Threads(threads)->UseRealTime();
-    add("CreateSamlToken/scaling", VerifyByUs, tokens.small)->Threads(threads)->UseRealTime();
+  for (const auto &[size, xml] : GetTokens()) {
+    add("Limit/" + size, CheckLimit, xml);
+    add("CreateSamlToken/" + size, VerifyByUs, xml);
   }
+  add("xmlsec1/5k", VerifyByXmlsec, GetSmallToken());
+  for (const int threads : THREAD_COUNTS) {
+    add("Limit/scaling", CheckLimit, GetSmallToken())->Threads(threads)->UseRealTime();
+    add("CreateSamlToken/scaling", VerifyByUs, GetSmallToken())->Threads(threads)->UseRealTime();
+  }
+}
+
+/// How many iterations that many threads do in a second.
+double Throughput(const Medians &medians, const std::string &name, int threads) {
+  return 1e6 / medians.at(name + "/scaling/real_time/threads:" + std::to_string(threads)).wallUs;
 }
 
 /// The throughput of two threads divided by that of one.
 double Scaling(const Medians &medians, const std::string &name) {
-  return medians.at(name + "/scaling/real_time/threads:1").wallUs /
-         medians.at(name + "/scaling/real_time/threads:2").wallUs;
+  return Throughput(medians, name, 2) / Throughput(medians, name, 1);
+}
+
+void WriteSizes(const Medians &medians, std::ostream &out) {
+  const char *separator = "";
+  for (const auto &[size, xml] : GetTokens()) {
+    out << separator << "{\"bytes\": " << xml.size() << ", \"ours_us\": " << medians.at("CreateSamlToken/" + size).cpuUs
+        << ", \"limit_us\": " << medians.at("Limit/" + size).cpuUs << '}';
+    separator = ",\n    ";
+  }
+}
+
+void WriteThreads(const Medians &medians, std::ostream &out) {
+  const char *separator = "";
+  for (const int threads : THREAD_COUNTS) {
+    out << separator << "{\"threads\": " << threads
+        << ", \"ours_per_second\": " << Throughput(medians, "CreateSamlToken", threads)
+        << ", \"limit_per_second\": " << Throughput(medians, "Limit", threads) << '}';
+    separator = ",\n    ";
+  }
 }
 
 // Times are microseconds of the measuring thread's CPU.
@@ -161,9 +193,8 @@ void WriteSummary(const Medians &medians, std::ostream &out) {
   const double mediumLimit = medians.at("Limit/50k").cpuUs;
   const double scaling = Scaling(medians, "CreateSamlToken");
   const double limitScaling = Scaling(medians, "Limit");
-  const Tokens &tokens = GetTokens();
-  const auto nanosecondsPerByte = [&medians](const char *name, const std::string &xml) {
-    return medians.at(name).cpuUs * 1000 / static_cast<double>(xml.size());
+  const auto nanosecondsPerByte = [&medians](const Token &token) {
+    return medians.at("CreateSamlToken/" + token.size).cpuUs * 1000 / static_cast<double>(token.xml.size());
   };
   out << "{\n\"token_verify\": {\"ours_us\": " << ours << ", \"limit_us\": " << limit << ", \"ratio\": " << ours / limit
       << ", \"peers\": {\"xmlsec1\": " << medians.at("xmlsec1/5k").cpuUs
@@ -172,8 +203,12 @@ void WriteSummary(const Medians &medians, std::ostream &out) {
       << ", \"limit\": " << limitScaling << ", \"ratio\": " << scaling / limitScaling
       << "},\n  \"by_size\": {\"5k_us\": " << ours << ", \"50k_us\": " << mediumOurs
       << ", \"5m_us\": " << medians.at("CreateSamlToken/5m").cpuUs
-      << ", \"50k_ns_per_byte\": " << nanosecondsPerByte("CreateSamlToken/50k", tokens.medium)
-      << ", \"5m_ns_per_byte\": " << nanosecondsPerByte("CreateSamlToken/5m", tokens.large) << "}}\n}\n";
+      << ", \"50k_ns_per_byte\": " << nanosecondsPerByte(GetTokens()[2])
+      << ", \"5m_ns_per_byte\": " << nanosecondsPerByte(GetTokens().back()) << "},\n  \"sizes\": [";
+  WriteSizes(medians, out);
+  out << "],\n  \"threads\": [";
+  WriteThreads(medians, out);
+  out << "]}\n}\n";
 }
 
 } // namespace

@@ -5,7 +5,7 @@
 
 #include "program.h"
 
-#include "xml/parse_xml.h"
+#include "xml/xml_text.h"
 
 #include <tarvel/xml/document.h>
 

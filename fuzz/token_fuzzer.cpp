@@ -8,12 +8,12 @@
 #include "support/facts_of.h"
 #include "token/assertion_parser.h"
 #include "token/token_facts.h"
-#include "xml/parse_xml.h"
+#include "xml/xml_text.h"
 
 #include <ssoclient/create_saml_token.h>
 #include <ssoclient/exceptions.h>
+#include <tarvel/core/environment.h>
 #include <tarvel/crypto/certificate.h>
-#include <tarvel/system/environment.h>
 #include <tarvel/xml/parser.h>
 #include <tarvel/xml/security/exceptions.h>
 
@@ -91,7 +91,7 @@ void ReadUnverifiedFacts(const ElementNode &element) {
 
 extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t *data, std::size_t size) {
   static const CertificateList trusted = Tarvel::Crypto::LoadCertificates(Testing::DataPath("tokens/sts-rsa.crt"));
-  static const Tarvel::System::ScopedEnvironment clock({[] { return std::int64_t{1'767'323'045'006'000}; }, {}});
+  static const Tarvel::ScopedEnvironment clock({[] { return std::int64_t{1'767'323'045'006'000}; }, {}});
   static const std::set<std::string> genuineFacts = ReadGenuineFacts(trusted);
   const auto requireGenuine = [](const std::shared_ptr<const SamlToken> &token) {
     Require(!token || genuineFacts.count(Testing::FactsOf(*token)) == 1);

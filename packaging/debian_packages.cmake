@@ -1,7 +1,6 @@
 # SPDX-License-Identifier: Apache-2.0
-# `cpack` in a build with prefix /usr makes Debian packages: the libraries, what is needed to build against them, the
-# tool, and, when they are built, the development token service and the negotiation handler over the GSSAPI with what is needed to
-# build against that. Needs dpkg-dev.
+# `cpack` in a build with prefix /usr makes Debian packages: the libraries, their development files and the tool; and, when they are
+# built, the development token service, and the negotiation handler over the GSSAPI with its development files. Needs dpkg-dev.
 
 set(CPACK_GENERATOR DEB)
 set(CPACK_PACKAGE_NAME ssoclient)

@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// `Advice`, what a token carries, or a request asks the service to put into a token, beside its statements.
+/// `Advice`, additional statements about the subject: in a token, or requested for one.
 
 #pragma once
 
@@ -11,13 +11,13 @@ namespace SsoClient {
 
 /// One attribute of an advice.
 struct AdviceAttribute {
-  std::string name;
+  std::string name;                ///< the name of the attribute
   std::vector<std::string> values; ///< in order
 };
 
-/// Advice from one source.
+/// The attributes that one source states.
 struct Advice {
-  std::string source;
+  std::string source;                      ///< the name of the source
   std::vector<AdviceAttribute> attributes; ///< in order
 };
 

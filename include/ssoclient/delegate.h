@@ -9,7 +9,7 @@
 
 namespace SsoClient {
 
-/// One entry of a token's delegation chain.
+/// One entry of a delegation chain.
 struct Delegate {
   PrincipalId subject;                        ///< the principal to which the token was delegated
   Tarvel::System::DateTime delegationInstant; ///< when the delegation took place

@@ -16,9 +16,9 @@
 
 namespace SsoClient {
 
-/// The texts of all elements in order, as `describe` gives them, with ", " between them. The separator stands wherever
-/// something was written before: empty texts at the beginning leave none.
-/// @param describe anything that `std::invoke` calls with a pointer to a const element and that returns a text.
+/// The texts that `describe` returns for the elements, in order and separated by ", ". Empty texts at the beginning are not
+/// followed by a separator.
+/// @param describe anything that `std::invoke` can call with a pointer to a const element and that returns a text
 template <typename Element, typename Describe>
 std::string AsString(const std::vector<Element> &elements, const Describe &describe) {
   std::string text;
@@ -31,16 +31,20 @@ std::string AsString(const std::vector<Element> &elements, const Describe &descr
   return text;
 }
 
-// The pointers must not be null.
+/// The principal and the time of a delegation. `delegate` is not null.
 SSOCLIENT_API std::string WriteDelegate(const Delegate *delegate);
+
+/// The name and the values of an attribute. `attribute` is not null.
 SSOCLIENT_API std::string WriteAdviceAttribute(const AdviceAttribute *attribute);
+
+/// The source of an advice and its attributes. `advice` is not null.
 SSOCLIENT_API std::string WriteAdvice(const Advice *advice);
 
-/// What is asked for. Not secret, but it names principals.
+/// All fields of a specification. The text is not secret, but contains the names of principals.
 SSOCLIENT_API std::string WriteTokenSpec(const TokenSpec &spec);
 
-/// What a log may show of a token: never its identifier, XML, signature, certificate, audience, advice or the subject's
-/// full name.
+/// A description of a token for logs. It never contains its identifier, XML, signature, certificate, audience or advice, nor
+/// the full name of the subject.
 SSOCLIENT_API std::string CreateRedactedDescription(const SamlToken &token);
 
 } // namespace SsoClient

@@ -1,6 +1,15 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// What the library raises.
+/// The exceptions of the client.
+///
+/// `SsoException` is the base of these classes only. The library also throws exceptions of the platform, which are not below
+/// it: `Tarvel::InvalidArgumentException`, `Tarvel::InvalidStateException`, `Tarvel::OutOfMemoryException`,
+/// `Tarvel::Http::MalformedURLException`, `Tarvel::Xml::XMLParseException` and
+/// `Tarvel::Xml::Security::XmlSecurityException`. Catch `Tarvel::Exception`, the base of all of them, to catch every failure
+/// of the library except `std::bad_alloc`.
+///
+/// An exception carries a message and no further fields. The comments below quote how messages begin, where programs may rely
+/// on it.
 
 #pragma once
 
@@ -11,33 +20,37 @@
 
 namespace SsoClient {
 
-/// Any failure of the library without a class of its own; the root of the library's exceptions. Bad arguments and
-/// misuse are the platform's `InvalidArgumentException` and `InvalidStateException`, which are not of this family.
+/// Any failure of an operation that has no class of its own. When the service answers with a fault, the message is
+/// "Unexpected SOAP fault: CODE; request failed.", where CODE is the fault code as the service wrote it.
 class SSOCLIENT_API SsoException : public Tarvel::Exception {
   TARVEL_EXCEPTION_BODY(SsoException, Tarvel::Exception);
 };
 
-/// A token that is not accepted. Only its two subclasses are raised.
+/// A token that is not accepted. Only its two subclasses are thrown.
 class SSOCLIENT_API InvalidTokenException : public SsoException {
   TARVEL_EXCEPTION_BODY(InvalidTokenException, SsoException);
 };
 
-/// A token whose signature does not verify.
+/// A token whose signature does not verify. The message begins with "Failed to verify signature: " when token, signature and
+/// trusted keys do not match, and with "Signature verification error. " when the signature cannot be checked.
 class SSOCLIENT_API InvalidSignatureException : public InvalidTokenException {
   TARVEL_EXCEPTION_BODY(InvalidSignatureException, InvalidTokenException);
 };
 
-/// Token XML that is not of the form that tokens have, or a token that is inconsistent, expired or not valid yet.
+/// A token that does not have the form of a token, or is inconsistent, expired or not valid yet. An expired token's message
+/// begins with "The token has expired at: ", that of a token that is not valid yet with "Token start date is in the future: ".
 class SSOCLIENT_API ParseException : public InvalidTokenException {
   TARVEL_EXCEPTION_BODY(ParseException, InvalidTokenException);
 };
 
-/// The exchange with the service failed below the level of its messages.
+/// The service cannot be reached, the connection failed or took too long, or the HTTP status is an error. The last of these
+/// has the message "Server returned error: CODE REASON", where CODE is the status in decimal. Other texts may change.
 class SSOCLIENT_API CommunicationException : public SsoException {
   TARVEL_EXCEPTION_BODY(CommunicationException, SsoException);
 };
 
-/// The service rejected the caller's credentials.
+/// The service refused the caller's credentials. The message is "Authentication failed", or "Authentication failed: TEXT"
+/// with the service's own text.
 class SSOCLIENT_API InvalidCredentialsException : public SsoException {
   TARVEL_EXCEPTION_BODY(InvalidCredentialsException, SsoException);
 };

@@ -15,22 +15,23 @@
 
 namespace SsoClient::InternalApi {
 
-/// The service's answer to one leg.
+/// The service's response to one leg.
 struct GssNegotiationResult {
-  /// The service's GSS output token, for the caller alone; empty when the service sent none. Never null.
+  /// The service's GSS output token; empty when the service sent none. Never null. The caller owns it alone.
   std::shared_ptr<std::vector<std::uint8_t>> serverLeg;
-  /// The issued token; null while the negotiation goes on.
+  /// The issued token; null until the negotiation is complete.
   std::shared_ptr<const SamlToken> token;
 };
 
-/// One negotiation over one session. For one caller at a time; always held by the shared pointer that
-/// `CreateGssNegotiationContext` made. It cannot be used for a second negotiation.
+/// One negotiation in one session. It cannot be used for a second negotiation. One thread at a time may use it. Always held by
+/// the shared pointer that `CreateGssNegotiationContext` returned.
 class SSOCLIENT_API GssNegotiationContext {
 public:
-  /// Sends the client's leg and waits, up to 40 seconds, for the service's answer.
-  /// @param leg the caller's GSS output token; may be empty.
+  /// Sends the client's leg and waits up to 40 seconds for the service's response.
+  /// @param leg the caller's GSS output token; may be empty
   /// @throws what the operations of `SecurityTokenService` throw, but ParseException for a token that is malformed,
-  ///         expired or not valid yet. After an exception the negotiation stands where the last answered leg left it.
+  ///         expired or not valid yet. After an exception the negotiation is in the state after the last leg that
+  ///         was answered.
   virtual GssNegotiationResult NegotiateToken(const std::vector<std::uint8_t> &leg) = 0;
 
 protected:
@@ -40,11 +41,10 @@ protected:
   ~GssNegotiationContext() = default;
 };
 
-/// A negotiation for a token as `spec` asks for, with the service that `config` describes. Nothing is connected or sent
-/// yet. Both are copied from; the configuration's SSL context must outlive the result. `useDomainControllerName` does not
-/// count here.
-/// @throws Tarvel::InvalidArgumentException without signing certificates, for an HTTPS address without an SSL context, and
-///         for an identity without key or certificate.
+/// A negotiation for a token with the properties of `spec`, with the service that `config` describes. Nothing is connected or
+/// sent yet. Both are copied; the result takes its own reference to the SSL context. `useDomainControllerName` is ignored.
+/// @throws Tarvel::InvalidArgumentException when there are no signing certificates, for an HTTPS address without an SSL
+///         context, and for an identity without key or certificate.
 /// @throws Tarvel::Http::MalformedURLException for a malformed address.
 SSOCLIENT_API std::shared_ptr<GssNegotiationContext>
 CreateGssNegotiationContext(const SecurityTokenServiceConfig &config, const TokenSpec &spec);

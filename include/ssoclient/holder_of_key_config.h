@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// `HolderOfKeyConfig`, the client identity that signs requests and that holder-of-key tokens are bound to.
+/// `HolderOfKeyConfig`, the client identity that signs requests and to which holder-of-key tokens are bound.
 
 #pragma once
 
@@ -10,10 +10,10 @@
 
 namespace SsoClient {
 
-/// A private key and its certificate, both shared with every copy; the certificate is released first, then the key. A
-/// service or a negotiation is not created with one that lacks either.
+/// A private key and its certificate. Copies share both. The certificate is released before the key. Creating a service or a
+/// negotiation fails when either is null.
 struct HolderOfKeyConfig {
-  Tarvel::Ref<const Tarvel::Crypto::PrivateKey> privateKey;   ///< signs requests, by RSA-SHA256: an RSA key
+  Tarvel::Ref<const Tarvel::Crypto::PrivateKey> privateKey;   ///< signs requests with RSA-SHA256; an RSA key
   Tarvel::Ref<const Tarvel::Crypto::Certificate> certificate; ///< sent with signed requests
 };
 

@@ -9,14 +9,14 @@
 
 namespace SsoClient {
 
-/// Level of operation frames and of request and result lines. The logger lets it through from the start.
+/// The level of lines about the start, the requests, the result and the end of operations. The logger's initial level.
 constexpr int LOG_LEVEL_OPERATION = 64;
 
-/// Level of the warning that a negotiation handler broke its contract.
+/// The level of the warning that a negotiation handler broke its contract.
 constexpr int LOG_LEVEL_CONTRACT_WARNING = 8;
 
-/// The library's logger, named "SsoClient" and of level 64 at first, made on first use. It lives until the process
-/// ends. Safe on any thread. Nothing is printed until the host installs a sink at
+/// The library's logger. Its name is "SsoClient", and its level is 64 until the host sets another. It is made on first use
+/// and lives until the process ends. Any thread may use it. Nothing is printed until the host installs a sink at
 /// `Tarvel::Service::GetApp().GetRootLogger()`.
 SSOCLIENT_API Tarvel::Service::Logger &getLogger();
 

@@ -19,12 +19,12 @@
 
 namespace SsoClient {
 
-/// A parsed, checked and verified token. Immutable: any number of threads may read it. Always held by a shared pointer
-/// to const that `CreateSamlToken` or an operation of the service made; the interface itself cannot be deleted through.
-/// What is returned by reference or pointer belongs to the token and is good as long as the token.
+/// A parsed, checked and verified token. Immutable: any number of threads may read it. Always held by the shared pointer to
+/// const that `CreateSamlToken` or an operation of the service returned; a pointer to this interface cannot be deleted. What
+/// is returned by reference or pointer belongs to the token and is valid as long as the token.
 class SSOCLIENT_API SamlToken {
 public:
-  /// How the bearer of the token proves to be its subject.
+  /// How the sender of the token proves to be its subject.
   enum ConfirmationType : std::int32_t {
     BEARER = 0,       ///< urn:oasis:names:tc:SAML:2.0:cm:bearer
     HOLDER_OF_KEY = 1 ///< urn:oasis:names:tc:SAML:2.0:cm:holder-of-key
@@ -33,39 +33,61 @@ public:
   /// The assertion's identifier.
   virtual const std::string &GetId() const = 0;
 
-  /// The validity window: from the start on, and before the end.
+  /// The first moment at which the token is valid.
   virtual const Tarvel::System::DateTime &GetStartDate() const = 0;
+
+  /// The first moment at which the token is no longer valid.
   virtual const Tarvel::System::DateTime &GetEndDate() const = 0;
 
+  /// The principal that the token is about.
   virtual const PrincipalId &GetSubject() const = 0;
 
+  /// Whether the token may be renewed.
   virtual bool IsRenewable() const = 0;
+
+  /// Whether the token may be delegated.
   virtual bool IsDelegable() const = 0;
 
-  /// Whether the token says that its subject is a solution rather than a person.
+  /// Whether the token says that its subject is a solution and not a person.
   virtual bool IsSolution() const = 0;
 
+  /// Whether the token is a bearer or a holder-of-key token.
   virtual ConfirmationType GetConfirmationMethod() const = 0;
 
-  /// Replaces `fullName` by the first name and the last name; each is empty when the token does not tell it.
+  /// Sets `fullName` to the first name and the last name. Each is empty when the token does not contain it.
   virtual void GetFullName(std::pair<std::string, std::string> &fullName) const = 0;
 
-  /// Replaces `groups` by the groups that the subject belongs to.
+  /// The same, returned.
+  std::pair<std::string, std::string> GetFullName() const;
+
+  /// Sets `groups` to the groups to which the subject belongs.
   virtual void GetGroups(std::vector<PrincipalId> &groups) const = 0;
 
-  /// Replaces `delegationChain` by the principals that the token was delegated to, the first one first.
+  /// The same, returned.
+  std::vector<PrincipalId> GetGroups() const;
+
+  /// Sets `delegationChain` to the principals to which the token was delegated, in the order of the delegations.
   virtual void GetDelegationChain(std::vector<Delegate> &delegationChain) const = 0;
 
-  /// Replaces `audience` by the audiences that the token is restricted to; empty means no restriction.
+  /// The same, returned.
+  std::vector<Delegate> GetDelegationChain() const;
+
+  /// Sets `audience` to the audiences to which the token is restricted. Empty means no restriction.
   virtual void GetAudience(std::set<std::string> &audience) const = 0;
 
-  /// Replaces `advice` by the advice that the token carries.
+  /// The same, returned.
+  std::set<std::string> GetAudience() const;
+
+  /// Sets `advice` to the advice in the token.
   virtual void GetAdvice(std::vector<Advice> &advice) const = 0;
 
-  /// The certificate whose key the bearer of a holder-of-key token must prove to hold; null for a bearer token.
+  /// The same, returned.
+  std::vector<Advice> GetAdvice() const;
+
+  /// The certificate of a holder-of-key token: its sender must prove possession of the private key. Null for a bearer token.
   virtual const Tarvel::Crypto::Certificate *GetConfirmationCertificate() const = 0;
 
-  /// The token's XML, fit to be sent to the service again. A bearer token's is a secret: whoever has it can use it.
+  /// The token's XML, which can be sent to a service. That of a bearer token is secret: everyone who has it can use it.
   virtual const std::string &ToXml() const = 0;
 
 protected:

@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// `SecurityTokenServiceConfig`, how to reach a token service and whom to trust.
+/// `SecurityTokenServiceConfig`, how to reach a token service and which keys to trust.
 
 #pragma once
 
@@ -17,22 +17,24 @@ class SSLContext;
 
 namespace SsoClient {
 
-/// Everything that is needed to create a token-service client. It is only read, and may be destroyed after the call
-/// that it was given to; the SSL context is not copied.
+/// What is needed to create the client of a token service. It may be changed or destroyed once the call that got it has
+/// returned: the call copies all fields, and takes its own reference to the SSL context.
 struct SecurityTokenServiceConfig {
-  /// The service's endpoint; its scheme decides between HTTPS and plain HTTP.
+  /// The address of the service. Its scheme is https or http.
   std::string stsUrl;
-  /// The service's signing certificates. Every token's signature must verify against one of them.
+  /// The service's signing certificates. The signature of every token must verify with the key of one of them.
   Tarvel::Crypto::CertificateList signingCertificates;
-  /// Given to the SSL handshake as it stands; when not empty, the expected SHA-256 thumbprint of the server's
-  /// certificate.
+  /// When not empty, the expected SHA-256 thumbprint of the server's certificate. It is passed to the TLS handshake unchanged;
+  /// see `Tarvel::Ssl::SSLStream`.
   std::string sslParameter;
-  /// Present when requests are to be signed and holder-of-key tokens may be requested.
+  /// The identity that signs requests and to which holder-of-key tokens are bound. Without it, requests are not signed and
+  /// tokens are bearer tokens.
   boost::optional<HolderOfKeyConfig> holderOfKeyConfig;
-  /// The context for HTTPS connections, required when `stsUrl` is an HTTPS URL. Not owned: it must outlive every
-  /// service that is created from this configuration.
+  /// The context for HTTPS connections, required when `stsUrl` is an HTTPS URL. This record does not own it: it must exist when
+  /// a service or a negotiation context is created from this record. Each of them takes a reference and holds it for its own
+  /// life, so the caller may release its own `Tarvel::Ref` as soon as it is created, or keep it longer.
   Tarvel::Ssl::SSLContext *sslContext = nullptr;
-  /// Asks for the name of a domain controller to connect to in place of the host.
+  /// Connects to a domain controller instead of the host of `stsUrl` when the name of one is known; see `GetOstrelDCName`.
   bool useDomainControllerName = false;
 };
 

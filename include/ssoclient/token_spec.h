@@ -16,26 +16,29 @@
 
 namespace SsoClient {
 
-/// What kind of token to ask for. Fields are set directly; they are judged when a request is built from them.
+/// The properties of a token to request. Set the fields directly; they are checked when a request is made from them.
+///
+/// It can be copied and moved, but not assigned: `spec = other` does not compile. Make a new one instead:
+/// `TokenSpec next(spec);`.
 struct SSOCLIENT_API TokenSpec {
-  /// Which subject confirmation is wanted.
+  /// Which subject confirmation is requested.
   enum Confirmation : std::int32_t {
-    CONFIRMATION_DEFAULT = 0, ///< holder-of-key when the service has a holder-of-key identity configured, else bearer
-    CONFIRMATION_NONE = 1     ///< always a bearer token
+    CONFIRMATION_DEFAULT = 0, ///< holder-of-key if the service was created with an identity, otherwise bearer
+    CONFIRMATION_NONE = 1     ///< bearer
   };
 
   TokenSpec();
   TokenSpec(const TokenSpec &other);
-  TokenSpec(TokenSpec &&other) noexcept; ///< leaves the audience set and the advice list of `other` empty
+  TokenSpec(TokenSpec &&other) noexcept; ///< leaves audiences and advice of `other` empty
   ~TokenSpec();
 
-  std::int64_t tokenLifetimeSec = 0;         ///< requested lifetime in seconds; a request needs a positive one
-  std::set<std::string> audienceRestriction; ///< audiences to which the token is to be restricted; empty: none
-  std::vector<Advice> advice;                ///< advice to be placed into the token, in order
-  bool delegable = false;                    ///< the token is to be delegable
-  boost::optional<std::string> delegateTo;   ///< principal to which the token is to be delegated, if any
-  bool renewable = false;                    ///< the token is to be renewable
-  Confirmation confirmation = CONFIRMATION_DEFAULT;
+  std::int64_t tokenLifetimeSec = 0;                ///< requested lifetime in seconds; must be positive
+  std::set<std::string> audienceRestriction;        ///< restricts the token to these audiences, if any
+  std::vector<Advice> advice;                       ///< advice for the token, in order
+  bool delegable = false;                           ///< requests a token that may be delegated
+  boost::optional<std::string> delegateTo;          ///< delegates the token to this principal
+  bool renewable = false;                           ///< requests a token that may be renewed
+  Confirmation confirmation = CONFIRMATION_DEFAULT; ///< requests this subject confirmation
 };
 
 } // namespace SsoClient

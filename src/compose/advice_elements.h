@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// The advice that a request asks the service to put into the token.
+/// The advice that a request asks for.
 
 #pragma once
 
@@ -12,7 +12,7 @@
 
 namespace SsoClient {
 
-/// `rsa-advice:AdviceSet`, which declares every prefix that is used in it, with one `rsa-advice:Advice` per entry.
+/// `rsa-advice:AdviceSet` with one `rsa-advice:Advice` per entry. It declares every prefix that is used in it.
 XMLBuilderPtr RsaAdviceSetBuilder(const std::vector<Advice> &advices);
 
 /// `rsa-advice:Advice` of one source, with one `rsa-advice:Attribute` per attribute.

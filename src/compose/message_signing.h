@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// The XML signature over the body and the timestamp of an envelope.
+/// The XML signature of the body and the timestamp of an envelope.
 
 #pragma once
 
@@ -15,14 +15,14 @@
 
 namespace SsoClient {
 
-/// Signs the envelope's body, and its timestamp when it has one, and appends the signature to `wsse:Security`.
+/// Signs the body of the envelope and, if it has one, its timestamp. Appends the signature to `wsse:Security`.
 /// @param keyInfo builds the content of the signature's `ds:KeyInfo`; null for none
 /// @throws Tarvel::InvalidArgumentException when the envelope has no body, header or security element.
 /// @throws Tarvel::Xml::Security::XmlSecurityException when the key cannot sign.
 void SignSoapMessage(const Tarvel::Crypto::PrivateKey &privateKey, const XMLBuilderPtr &keyInfo,
                      const Tarvel::Ref<Tarvel::Xml::ElementNode> &envelope);
 
-/// The element's `wsu:Id`; an element without one is given one, made of its local name and a new UUID.
+/// The `wsu:Id` of the element. If it has none, it gets one that consists of its local name and a new UUID.
 std::string CreateWssuId(Tarvel::Xml::ElementNode *element);
 
 /// Adds a reference to `element`, by its `wsu:Id`, to the signature.

@@ -14,7 +14,7 @@ namespace SsoClient {
 XMLBuilderPtr SoapBuilder(const XMLBuilderPtr &header, const XMLBuilderPtr &body) {
   auto soapHeader = std::make_shared<XMLCompositeBuilder>(ElementBuilder("soapenv", "Header"));
   soapHeader->Add(header);
-  // Some services look for the WS-Trust namespace on the body itself, so it is declared here besides on the request.
+  // Some services look for the declaration of the WS-Trust namespace on the body, so it is here as well as on the request.
   auto soapBody = std::make_shared<XMLCompositeBuilder>(
       ElementBuilder("soapenv", "Body", {{"xmlns:wst", std::string(Namespaces::WST)}}));
   soapBody->Add(body);

@@ -13,15 +13,15 @@
 
 namespace SsoClient {
 
-/// The envelope around `header` and `body`; where one is null, its element stays empty.
+/// An envelope that contains `header` and `body`. If one is null, its element is empty.
 XMLBuilderPtr SoapBuilder(const XMLBuilderPtr &header, const XMLBuilderPtr &body);
 
-/// An envelope whose body and timestamp are signed when it is built. Each build signs anew.
+/// An envelope whose body and timestamp are signed when it is built. Each build makes a new signature.
 class XMLSignedSoapBuilder final : public XMLBaseBuilder {
 public:
   /// @param header the `wsse:Security` element with its timestamp, which receives the signature
   /// @param privateKey not owned: it must live as long as the builder
-  /// @param keyInfo the reference that tells which key signed; null for none
+  /// @param keyInfo a reference to the key that signs; null for none
   XMLSignedSoapBuilder(XMLBuilderPtr header, XMLBuilderPtr body, const Tarvel::Crypto::PrivateKey *privateKey,
                        XMLBuilderPtr keyInfo);
 
@@ -35,13 +35,13 @@ private:
   XMLBuilderPtr m_keyInfo;
 };
 
-/// A signed envelope that carries `certificate` behind the header's tokens, and whose signature points at it.
+/// A signed envelope that contains `certificate` after the tokens of the header. The signature refers to the certificate.
 /// @param privateKey not owned: it must live as long as the builder
 XMLBuilderPtr CertRefSignedSoapBuilder(const XMLBuilderPtr &header, const XMLBuilderPtr &body,
                                        const Tarvel::Crypto::PrivateKey *privateKey,
                                        const Tarvel::Crypto::Certificate *certificate);
 
-/// A signed envelope whose signature points at the SAML assertion of that identifier, which the header already holds.
+/// A signed envelope whose signature refers to the SAML assertion with that identifier, which is in the header already.
 /// @param privateKey not owned: it must live as long as the builder
 XMLBuilderPtr SamlRefSignedSoapBuilder(const XMLBuilderPtr &header, const XMLBuilderPtr &body,
                                        const Tarvel::Crypto::PrivateKey *privateKey, const std::string &assertionId);

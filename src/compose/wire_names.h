@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// The URIs and identifiers that outgoing messages are written with, besides the namespaces.
+/// The URIs and identifiers in outgoing messages, except namespaces and what is in the WS-Trust namespace.
 
 #pragma once
 
@@ -17,15 +17,15 @@ constexpr std::string_view X509V3 =
 /// Username Token Profile 1.0: a password in clear text.
 constexpr std::string_view PASSWORD_TEXT =
     "http://docs.oasis-open.org/wss/2004/01/oasis-200401-wss-username-token-profile-1.0#PasswordText";
-// The services expect exactly these two: "tokenprofile" in the token type, "token-profile" in the value type.
+// Services expect exactly these two spellings: "tokenprofile" in the token type, "token-profile" in the value type.
 constexpr std::string_view SAML_TOKEN_TYPE = "http://docs.oasis-open.org/wss/oasis-wss-saml-tokenprofile-1.1#SAMLV2.0";
 constexpr std::string_view SAML_ID = "http://docs.oasis-open.org/wss/oasis-wss-saml-token-profile-1.1#SAMLID";
-/// The SPNEGO binary exchange keeps the value type of the February 2005 WS-Trust on purpose.
+/// The SPNEGO binary exchange uses the value type of WS-Trust of February 2005 on purpose.
 constexpr std::string_view SPNEGO = "http://schemas.xmlsoap.org/ws/2005/02/trust/spnego";
 
 /// The identifier of the binary security token that holds the client's certificate.
 constexpr std::string_view HOLDER_OF_KEY_CERTIFICATE_ID = "holderOfKeyCertificate";
-/// The identifier of the message signature, to which `wst:UseKey` points.
+/// The identifier of the message signature, to which `wst:UseKey` refers.
 constexpr std::string_view HOLDER_OF_KEY_SIGNATURE_ID = "holderOfKeyProofSignature";
 
 } // namespace SsoClient::WireNames

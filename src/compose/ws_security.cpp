@@ -5,7 +5,7 @@
 #include "compose/wire_names.h"
 #include "model/namespaces.h"
 #include "xml/date_time_text.h"
-#include "xml/parse_xml.h"
+#include "xml/xml_text.h"
 
 #include <tarvel/core/string_util.h>
 #include <tarvel/system/date_time.h>

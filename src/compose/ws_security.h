@@ -13,17 +13,17 @@
 
 namespace SsoClient {
 
-/// `wsse:Security` with a timestamp that begins now and ends `minutes` later; tokens are added behind the timestamp.
+/// `wsse:Security` with a timestamp that begins now and ends `minutes` later. Tokens are added after the timestamp.
 XMLCompositePtr WsSecurityHeaderBuilder(int minutes);
 
-/// `wsu:Timestamp` from now, read once, to `minutes` later.
+/// `wsu:Timestamp` from now to `minutes` later. The clock is read once.
 XMLCompositePtr WssuTimestampBuilder(int minutes);
 
-/// `wsse:UsernameToken`, without and with a password, which is written in clear text: the channel must keep it secret.
+/// `wsse:UsernameToken` without or with a password. The password is in clear text: the connection must keep it secret.
 XMLCompositePtr WsseUsernameTokenBuilder(const std::string &user);
 XMLCompositePtr WsseUsernameTokenBuilder(const std::string &user, const std::string &password);
 
-/// `wsse:BinarySecurityToken` with that identifier, holding the certificate. Relies on the header for the prefix "wsse".
+/// `wsse:BinarySecurityToken` with that identifier and the certificate. The prefix "wsse" must be declared by the header.
 XMLBuilderPtr WsseX509v3BinarySecTokenBuilder(const std::string &id, const Tarvel::Crypto::Certificate *certificate);
 
 /// `wsse:SecurityTokenReference` to the binary security token with that identifier.
@@ -32,7 +32,7 @@ XMLBuilderPtr WsseX509v3BSTReferenceBuilder(const std::string &id);
 /// `wsse:SecurityTokenReference` to the SAML assertion with that identifier.
 XMLBuilderPtr WsseSamlKeyIdReferenceBuilder(const std::string &assertionId);
 
-/// The token's own assertion element, as it was issued, so that its signature stays valid. Builds into one tree only.
+/// The assertion element of the token as it was issued, so that its signature stays valid. It can be built into one tree only.
 /// @throws what `ParseXML` throws when the token's text does not parse.
 XMLBuilderPtr InsertSamlTokenBuilder(const SamlToken &token);
 

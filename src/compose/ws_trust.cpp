@@ -11,21 +11,12 @@
 #include <tarvel/core/string_util.h>
 #include <tarvel/system/date_time.h>
 
-#include <limits>
-
 namespace SsoClient {
 
 namespace {
 
-constexpr std::int64_t MICROSECONDS_PER_SECOND = 1000000;
-
 std::string BooleanText(bool value) {
   return value ? "true" : "false";
-}
-
-/// A URI below the WS-Trust namespace; `path` begins with a slash.
-std::string WstUri(const char *path) {
-  return std::string(Namespaces::WST) + path;
 }
 
 XMLCompositePtr RequestSecurityTokenBuilder(const std::string &tokenType, const std::string &requestType) {
@@ -36,28 +27,19 @@ XMLCompositePtr RequestSecurityTokenBuilder(const std::string &tokenType, const 
   return request;
 }
 
-/// `name` with the token's own assertion element as its only child.
+/// The element `name`, whose only child is the assertion element of the token.
 XMLBuilderPtr TokenTargetBuilder(const std::string &name, const SamlToken &token) {
   auto target = std::make_shared<XMLCompositeBuilder>(ElementBuilder("wst", name));
   target->Add(InsertSamlTokenBuilder(token));
   return target;
 }
 
-/// `utcMicroseconds` and `seconds` later, or the nearest number to that.
-std::int64_t AddSeconds(std::int64_t utcMicroseconds, std::int64_t seconds) {
-  std::int64_t result = 0;
-  if (__builtin_mul_overflow(seconds, MICROSECONDS_PER_SECOND, &result) ||
-      __builtin_add_overflow(utcMicroseconds, result, &result)) {
-    return seconds < 0 ? std::numeric_limits<std::int64_t>::min() : std::numeric_limits<std::int64_t>::max();
-  }
-  return result;
-}
-
 } // namespace
 
 XMLCompositePtr CommonAcquireSecurityTokenBuilder(SamlToken::ConfirmationType confirmation, const TokenSpec &spec) {
-  const std::string keyType = WstUri(confirmation == SamlToken::BEARER ? "/Bearer" : "/PublicKey");
-  XMLCompositePtr request = RequestSecurityTokenBuilder(std::string(Namespaces::SAML), WstUri("/Issue"));
+  const std::string keyType =
+      confirmation == SamlToken::BEARER ? WstUris::KEY_TYPE_BEARER : WstUris::KEY_TYPE_PUBLIC_KEY;
+  XMLCompositePtr request = RequestSecurityTokenBuilder(std::string(Namespaces::SAML), WstUris::ISSUE);
   request->Add(TextElementBuilder("wst", "KeyType", keyType))
       .Add(WssuLifetimeBuilder(spec.tokenLifetimeSec))
       .Add(WstRenewingBuilder(spec.renewable))
@@ -87,21 +69,20 @@ XMLCompositePtr ExchangeSecurityTokenBuilder(SamlToken::ConfirmationType confirm
 }
 
 XMLBuilderPtr RenewSecurityTokenBuilder(const SamlToken &token, std::int64_t lifetimeSec) {
-  XMLCompositePtr request = RequestSecurityTokenBuilder(std::string(Namespaces::SAML), WstUri("/Renew"));
+  XMLCompositePtr request = RequestSecurityTokenBuilder(std::string(Namespaces::SAML), WstUris::RENEW);
   request->Add(WssuLifetimeBuilder(lifetimeSec)).Add(TokenTargetBuilder("RenewTarget", token));
   return request;
 }
 
 XMLBuilderPtr ValidateSecurityTokenBuilder(const SamlToken &token) {
-  XMLCompositePtr request = RequestSecurityTokenBuilder(WstUri("/RSTR/Status"), WstUri("/Validate"));
+  XMLCompositePtr request = RequestSecurityTokenBuilder(WstUris::TOKEN_TYPE_STATUS, WstUris::VALIDATE);
   request->Add(TokenTargetBuilder("ValidateTarget", token));
   return request;
 }
 
 XMLBuilderPtr WssuLifetimeBuilder(std::int64_t seconds) {
   const Tarvel::System::DateTime now = Tarvel::System::GetUtcDateTime();
-  const Tarvel::System::DateTime expires =
-      Tarvel::System::DateTimeFromUtc(AddSeconds(now.GetUtcTime(), seconds), false);
+  const Tarvel::System::DateTime expires = now.PlusSeconds(seconds);
   auto lifetime = std::make_shared<XMLCompositeBuilder>(
       ElementBuilder("wst", "Lifetime", {{"xmlns:wsu", std::string(Namespaces::WSU)}}));
   lifetime->Add(TextElementBuilder("wsu", "Created", DateTimeFormatter(now)))

@@ -16,30 +16,30 @@
 
 namespace SsoClient {
 
-/// What every issue request asks for; further children may be added behind.
+/// The elements that all issue requests have in common. Further children may be added.
 XMLCompositePtr CommonAcquireSecurityTokenBuilder(SamlToken::ConfirmationType confirmation, const TokenSpec &spec);
 
-/// An issue request. For a holder-of-key token it ends in `wst:UseKey`, which names the message signature.
+/// An issue request. For a holder-of-key token its last element is `wst:UseKey`, which refers to the message signature.
 XMLCompositePtr AcquireSecurityTokenBuilder(SamlToken::ConfirmationType confirmation, const TokenSpec &spec);
 
-/// An issue request made with a token. It has no `wst:UseKey`, on purpose, whatever the confirmation.
+/// An issue request that presents a token. It never has a `wst:UseKey`, on purpose.
 XMLCompositePtr ExchangeSecurityTokenBuilder(SamlToken::ConfirmationType confirmation, const TokenSpec &spec);
 
-/// A request to renew `token` for `lifetimeSec` seconds from now. Builds into one tree only.
+/// A request to renew `token` for `lifetimeSec` seconds from now. It can be built into one tree only.
 /// @throws what `ParseXML` throws when the token's text does not parse.
 XMLBuilderPtr RenewSecurityTokenBuilder(const SamlToken &token, std::int64_t lifetimeSec);
 
-/// A request to judge `token`. Builds into one tree only.
+/// A request to validate `token`. It can be built into one tree only.
 /// @throws what `ParseXML` throws when the token's text does not parse.
 XMLBuilderPtr ValidateSecurityTokenBuilder(const SamlToken &token);
 
-/// `wst:Lifetime` from now to `seconds` later, and no later than the last moment that a date-time can tell.
+/// `wst:Lifetime` from now to `seconds` later, at most to the last moment that a date-time can represent.
 XMLBuilderPtr WssuLifetimeBuilder(std::int64_t seconds);
 
-/// `wst:Renewing`; renewal after expiry is never asked for.
+/// `wst:Renewing`. Renewal after expiry is never requested.
 XMLBuilderPtr WstRenewingBuilder(bool allow);
 
-/// `wst:DelegateTo`, the principal as a username token without password.
+/// `wst:DelegateTo` with the principal as a username token without password.
 XMLBuilderPtr WstDelegateToBuilder(const std::string &name);
 
 /// `wst:Participants`, one `wst:Participant` for each audience entry.

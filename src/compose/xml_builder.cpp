@@ -2,7 +2,7 @@
 
 #include "compose/xml_builder.h"
 
-#include <tarvel/core/secure_wipe.h>
+#include <tarvel/core/secret_text.h>
 #include <tarvel/io/writer.h>
 
 #include <utility>
@@ -33,21 +33,18 @@ private:
 
 class TextElementBuilderImpl final : public XMLBaseBuilder {
 public:
-  /// The text is copied straight into its field: a parameter in between would leave a short one behind on the stack.
+  /// `text` is copied directly into its field: a copy in a parameter could stay on the stack.
   TextElementBuilderImpl(std::string prefix, std::string name, XMLAttributes attributes, const std::string &text)
       : m_element(std::move(prefix), std::move(name), std::move(attributes)), m_text(text) {}
-  TextElementBuilderImpl(const TextElementBuilderImpl &) = delete;
-  TextElementBuilderImpl &operator=(const TextElementBuilderImpl &) = delete;
-  ~TextElementBuilderImpl() { Tarvel::SecureWipe(m_text); }
 
   void build(ElementRef &out) const override {
     m_element.build(out);
-    out->AppendText(m_text);
+    out->AppendText(m_text.Get());
   }
 
 private:
   ElementBuilderImpl m_element;
-  std::string m_text;
+  Tarvel::SecretText m_text;
 };
 
 } // namespace

@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// The builders that every outgoing message is composed of: small immutable descriptions of XML elements.
+/// Builders: small immutable descriptions of XML elements, of which all outgoing messages are composed.
 
 #pragma once
 
@@ -14,11 +14,11 @@
 
 namespace SsoClient {
 
-/// Knows how to make one element. Immutable once its factory has returned, except a composite that its maker still fills;
-/// may then be shared by several trees and built on several threads at once.
+/// Makes one element. Immutable once its factory has returned (a composite: once its last child has been added). From then on
+/// it may be shared by several trees and built on several threads at once.
 class XMLBaseBuilder {
 public:
-  /// Makes the element, with all below it, and puts it into `out` in place of what that held.
+  /// Sets `out` to the element with its content.
   /// @throws Tarvel::InvalidArgumentException for a text or attribute value that XML 1.0 cannot carry.
   virtual void build(Tarvel::Ref<Tarvel::Xml::ElementNode> &out) const = 0;
 
@@ -31,26 +31,26 @@ protected:
 
 using XMLBuilderPtr = std::shared_ptr<const XMLBaseBuilder>;
 
-/// Attribute values by qualified name, in the order in which they are written: byte by byte of the names. Namespace
-/// declarations are ordinary entries. A literal list that repeats a name keeps the first value.
+/// Attribute values by qualified name. They are written in the byte order of the names. Namespace declarations are ordinary
+/// entries. If an initialiser list repeats a name, the first value is used.
 using XMLAttributes = std::map<std::string, std::string>;
 
 /// An element without content.
 XMLBuilderPtr ElementBuilder(const std::string &prefix, const std::string &name, XMLAttributes attributes);
 XMLBuilderPtr ElementBuilder(const std::string &prefix, const std::string &name);
 
-/// An element whose only child is a text node, also when `text` is empty. The text is given unescaped, and is wiped when
-/// the builder goes, since it may be a password.
+/// An element whose only child is a text node, even if `text` is empty. `text` is not escaped. The builder's copy is wiped when
+/// the builder is destroyed, because it may be a password.
 XMLBuilderPtr TextElementBuilder(const std::string &prefix, const std::string &name, XMLAttributes attributes,
                                  const std::string &text);
 XMLBuilderPtr TextElementBuilder(const std::string &prefix, const std::string &name, const std::string &text);
 
-/// What another builder makes, with further child elements behind those that it already has.
+/// The element of another builder with further child elements after those that it has.
 class XMLCompositeBuilder final : public XMLBaseBuilder {
 public:
   explicit XMLCompositeBuilder(XMLBuilderPtr base);
 
-  /// Appends a child and returns this composite. Null is ignored, so that an optional part need not be checked first.
+  /// Appends a child and returns this composite. Null is ignored, so that callers need not check an optional part.
   XMLCompositeBuilder &Add(XMLBuilderPtr child);
 
   void build(Tarvel::Ref<Tarvel::Xml::ElementNode> &out) const override;
@@ -62,8 +62,8 @@ private:
 
 using XMLCompositePtr = std::shared_ptr<XMLCompositeBuilder>;
 
-/// An element that exists already. Each build hands out this very node, not a copy: it fits into one tree only, and a
-/// second one refuses it.
+/// An element that exists already. Each build returns the same node, not a copy. So it can be added to one tree only: a
+/// second tree refuses it.
 class PreBuiltElementImpl final : public XMLBaseBuilder {
 public:
   explicit PreBuiltElementImpl(Tarvel::Ref<Tarvel::Xml::ElementNode> element);
@@ -77,12 +77,12 @@ private:
 /// Builds `child` and makes it the last child of `parent`.
 void BuildAndAppendChildTo(Tarvel::Xml::ElementNode *parent, const XMLBuilderPtr &child);
 
-/// Defines the attribute, a name and its value, on `element`.
+/// Defines `attribute` on `element`.
 void ElementDefineAttribute(Tarvel::Xml::ElementNode *element, const XMLAttributes::value_type &attribute);
 
-/// Builds the tree and returns it as XML text, without an XML declaration. Text and attribute values are ASCII, with
-/// references for all other characters: requests have no charset in their media type, so a service may take them for
-/// ISO-8859-1. Names, comments and processing instructions of a pre-built element stay UTF-8.
+/// Builds the tree and returns it as XML text without an XML declaration. Text and attribute values are ASCII, with character
+/// references for all other characters: the media type of requests has no charset, so a service may read them as ISO-8859-1.
+/// Names, comments and processing instructions of a pre-built element stay UTF-8.
 std::string SerializeToXML(const XMLBuilderPtr &builder);
 
 } // namespace SsoClient

@@ -9,9 +9,10 @@
 namespace SsoClient {
 
 /// A serialised SOAP envelope and the action to post it with. The envelope may carry a password or a bearer token, so
-/// each record wipes its own when it is destroyed or overwritten.
+/// the body is wiped when the record is destroyed or overwritten.
 struct Request {
-  /// The only values of `soapAction`. The spelling of `CHALLANGE`, and that it alone is below "RSTR", must stay.
+  /// The only values of `soapAction`. Two oddities must stay: the spelling of `CHALLANGE`, and that its path alone begins
+  /// with "/RSTR".
   static const char *const ISSUE;
   static const char *const RENEW;
   static const char *const VALIDATE;
@@ -20,7 +21,7 @@ struct Request {
   Request() = default;
   Request(const Request &) = default;
   Request(Request &&) noexcept = default;
-  Request &operator=(Request other) noexcept; ///< takes copies and temporaries alike; wipes what was here before
+  Request &operator=(Request other) noexcept; ///< copies or moves; wipes the old body
   ~Request();
 
   std::string soapAction; ///< value of the `SOAPAction` HTTP header, without quotes

@@ -1,6 +1,8 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// `RequestBuilder`, the service's view of what composes its requests.
+/// `RequestBuilder`, which composes the requests of the service's operations.
+///
+/// It is an interface so that tests can replace it. The product has one implementation.
 
 #pragma once
 
@@ -26,7 +28,7 @@ public:
   virtual void BuildInitialSPNegoRequest(const TokenSpec &spec, const std::vector<std::uint8_t> &leg,
                                          Request &request) const = 0;
 
-  /// A further leg of the negotiation that `contextId` names.
+  /// A further leg of the negotiation with the identifier `contextId`.
   virtual void BuildContinuedSPNegoRequest(const std::string &contextId, const std::vector<std::uint8_t> &leg,
                                            Request &request) const = 0;
 
@@ -36,7 +38,7 @@ public:
   /// An issue request authenticated by an existing token.
   virtual void BuildExchangeTokenRequest(const SamlToken &token, const TokenSpec &spec, Request &request) const = 0;
 
-  /// A request to judge a token.
+  /// A request to validate a token.
   virtual void BuildValidateSubjectRequest(const SamlToken &token, Request &request) const = 0;
 
   /// A request to renew a token for `lifetimeSec` seconds from now.

@@ -23,14 +23,14 @@ XMLBuilderPtr SecurityHeader() {
   return WsSecurityHeaderBuilder(TIMESTAMP_VALIDITY_MINUTES);
 }
 
-/// The security header with `token` behind the timestamp.
+/// The security header with `token` after the timestamp.
 XMLBuilderPtr SecurityHeaderWith(const XMLBuilderPtr &token) {
   auto header = std::make_shared<XMLCompositeBuilder>(SecurityHeader());
   header->Add(token);
   return header;
 }
 
-/// Puts `body` into the request; an earlier body may be as secret, and is wiped.
+/// Sets the body of the request. An earlier body is wiped, because it may be secret, too.
 void SetBody(Request &request, std::string body) {
   request.body.swap(body);
   Tarvel::SecureWipe(body);
@@ -51,7 +51,7 @@ void RequestBuilderImpl::BuildUserPassTokenRequest(const std::string &username, 
   const XMLBuilderPtr header = SecurityHeaderWith(WsseUsernameTokenBuilder(username, password));
   const XMLBuilderPtr body = AcquireSecurityTokenBuilder(GetEffectiveConfirmationType(spec.confirmation), spec);
   request.soapAction = Request::ISSUE;
-  // The body follows the spec's own confirmation, the signature the one that a delegate overrides: both on purpose.
+  // On purpose, the body depends on the spec's own confirmation, but the signature on that which a delegate overrides.
   SetBody(request, BuildTokenRequest(ConfOverrideWithDelegate(spec), header, body));
 }
 
@@ -160,7 +160,7 @@ void ValidateTokenIsHok(const SamlToken &token, const std::string &actionName) {
   }
 }
 
-// NOLINTNEXTLINE(performance-unnecessary-value-param): callers hand over a copy of their own.
+// NOLINTNEXTLINE(performance-unnecessary-value-param): a parameter by value is the established form.
 TokenSpec::Confirmation ConfOverrideWithDelegate(TokenSpec spec) {
   return spec.delegateTo ? TokenSpec::CONFIRMATION_NONE : spec.confirmation;
 }

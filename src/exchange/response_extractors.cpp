@@ -4,13 +4,11 @@
 
 #include "exchange/soap_response.h"
 #include "model/namespaces.h"
-#include "xml/node_text.h"
+#include "xml/xml_text.h"
 
 #include <ssoclient/exceptions.h>
 #include <tarvel/core/exception.h>
 #include <tarvel/core/string_util.h>
-#include <tarvel/io/writer.h>
-#include <tarvel/xml/security/canonicalizer.h>
 
 #include <cstdint>
 #include <string_view>
@@ -20,19 +18,12 @@ namespace SsoClient {
 
 namespace {
 
-using Tarvel::Ref;
 using Tarvel::Xml::ElementNode;
 using Tarvel::Xml::TextNode;
 
 constexpr const char *UNEXPECTED_FORMAT = "Unexpected XML format";
-// Belongs to the established texts of this place, though no answer is refused with it.
+// One of the established texts of this place, although no response is refused with it.
 [[maybe_unused]] constexpr const char *UNKNOWN_FAULT_CODE = "Unknown fault code:";
-
-// The published URI has no "#" at its end; the canonicalizer knows this spelling as the same algorithm.
-constexpr const char *CANONICAL_XML = "http://www.w3.org/TR/2001/REC-xml-c14n-20010315#";
-
-constexpr std::string_view STATUS_VALID = "/status/valid";     // below the WS-Trust namespace
-constexpr std::string_view STATUS_INVALID = "/status/invalid"; // below the WS-Trust namespace
 
 [[noreturn]] void ThrowUnexpectedFormat() {
   throw SsoException(UNEXPECTED_FORMAT);
@@ -43,10 +34,6 @@ const ElementNode &RequireElement(const ElementNode *element) {
     ThrowUnexpectedFormat();
   }
   return *element;
-}
-
-bool IsWstStatus(std::string_view text, std::string_view path) noexcept {
-  return text.substr(0, Namespaces::WST.size()) == Namespaces::WST && text.substr(Namespaces::WST.size()) == path;
 }
 
 std::string TextOfChild(const ElementNode &parent, std::string_view localName) {
@@ -72,18 +59,12 @@ std::vector<std::uint8_t> DecodeLeg(const std::string &text) {
 void RequireSamlTokenType(const ElementNode &response) {
   const std::string type = TextOfChild(response, "TokenType");
   if (type != Namespaces::SAML) {
-    // The parenthesis stays open: that is the message's established form.
+    // The parenthesis stays open: this is the established form of the message.
     throw SsoException("Invalid token type: " + type + " (expected: " + std::string(Namespaces::SAML));
   }
 }
 
 } // namespace
-
-std::string CanonicalElementText(const ElementNode &element) {
-  const Ref<Tarvel::StringWriter> writer = Tarvel::CreateStringWriter();
-  Tarvel::Xml::Security::CreateCanonicalizer(CANONICAL_XML)->Canonicalize(element, *writer);
-  return writer->TakeText();
-}
 
 std::string ExtractIssuedToken(const ElementNode &body) {
   return CanonicalElementText(
@@ -101,10 +82,10 @@ bool ExtractValidationStatus(const ElementNode &body) {
   if (!code) {
     ThrowUnexpectedFormat();
   }
-  if (IsWstStatus(code->GetValue(), STATUS_VALID)) {
+  if (code->GetValue() == WstUris::STATUS_VALID) {
     return true;
   }
-  if (IsWstStatus(code->GetValue(), STATUS_INVALID)) {
+  if (code->GetValue() == WstUris::STATUS_INVALID) {
     return false;
   }
   ThrowUnexpectedFormat();

@@ -2,8 +2,8 @@
 /// @file
 /// What each operation takes out of the SOAP body of its response.
 ///
-/// Elements are found by local name; their namespace does not count, and the first of a name wins. Whatever is missing
-/// ends in an `SsoException`.
+/// Elements are found by local name: the namespace is ignored, and the first element of a name is used. All functions throw
+/// `SsoException` when an element that they need is missing.
 
 #pragma once
 
@@ -15,22 +15,17 @@
 
 namespace SsoClient {
 
-/// The inclusive canonical form of `element` as it stands in its document: the text stands on its own, with all
-/// namespace declarations that it needs, and its signature stays good.
-/// @throws Tarvel::Xml::Security::XmlSecurityException when it has none, as with a prefix that is not bound.
-std::string CanonicalElementText(const Tarvel::Xml::ElementNode &element);
-
-/// The assertion of an issue response, which comes in a collection. @throws as `CanonicalElementText` besides.
+/// The assertion of an issue response, which is in a collection. Also throws what `CanonicalElementText` throws.
 std::string ExtractIssuedToken(const Tarvel::Xml::ElementNode &body);
 
-/// The assertion of a renew response, which comes without a collection. @throws as `CanonicalElementText` besides.
+/// The assertion of a renew response, which is in no collection. Also throws what `CanonicalElementText` throws.
 std::string ExtractRenewedToken(const Tarvel::Xml::ElementNode &body);
 
 /// Whether a validate response says that the token is valid.
 bool ExtractValidationStatus(const Tarvel::Xml::ElementNode &body);
 
-/// One leg of a negotiation: an intermediate one has no collection around it, the final one has, and brings the token.
-/// @throws as `CanonicalElementText` besides.
+/// One leg of a negotiation. The response to the final leg is in a collection and has the token; the responses before it
+/// are in no collection. Also throws what `CanonicalElementText` throws.
 SPNegoResponse ExtractSPNegoLeg(const Tarvel::Xml::ElementNode &body);
 
 } // namespace SsoClient

@@ -1,6 +1,8 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// `ResponseHandler`, the service's view of what reads its responses.
+/// `ResponseHandler`, which reads the responses to the service's operations.
+///
+/// It is an interface so that tests can replace it. The product has one implementation.
 
 #pragma once
 
@@ -12,20 +14,20 @@
 
 namespace SsoClient {
 
-/// Reads the response of each operation. Each call reads the whole body from the reader, which the caller owns. Safe on
-/// any thread. All throw on a SOAP fault and on a malformed response.
+/// Reads the response of each operation. Each call reads the whole body from the reader, which the caller owns. Any number of
+/// threads may use one handler. All functions throw on a SOAP fault and on a malformed response.
 class ResponseHandler {
 public:
   /// Sets `tokenXml` to the token of an issue response.
   virtual void HandleAcquireTokenResponse(Tarvel::Reader *response, std::string &tokenXml) const = 0;
 
-  /// @return whether the service judged the token valid.
+  /// @return whether the service says that the token is valid.
   virtual bool HandleValidateSubjectResponse(Tarvel::Reader *response) const = 0;
 
   /// Sets `tokenXml` to the token of a renew response.
   virtual void HandleRenewTokenResponse(Tarvel::Reader *response, std::string &tokenXml) const = 0;
 
-  /// Fills the record for one leg of a negotiation.
+  /// Sets all fields of `spnego` to the service's response to one leg of a negotiation.
   virtual void HandleSPNegoResponse(Tarvel::Reader *response, SPNegoResponse &spnego) const = 0;
 
 protected:

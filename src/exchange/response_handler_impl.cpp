@@ -15,14 +15,14 @@ namespace {
 
 using Tarvel::Xml::ElementNode;
 
-/// What `extractor` makes of the body of a response that is no fault. The root element's own name does not count.
+/// The result of `extractor` for the body of a response that is not a fault. The name of the root element is ignored.
 template <typename Extractor>
 auto ProcessResponseWith(Tarvel::Reader &response, const Extractor &extractor) {
   const Tarvel::Ref<const ElementNode> envelope = ParseResponseDocument(response);
   CheckSoapFault(*envelope);
   const ElementNode *const body = envelope->FindChildElement("Body");
   if (!body) {
-    // "SAOP" is how the message is known.
+    // "SAOP" is the established spelling of the message.
     throw SsoException("Unexpected response format: missing SAOP Body.");
   }
   return extractor(*body);

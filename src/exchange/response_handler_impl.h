@@ -8,12 +8,14 @@
 
 namespace SsoClient {
 
-/// Parses the body, turns a SOAP fault into an exception, and takes out what the operation asked for. Without state, so
-/// one handler serves any number of threads. A call that throws leaves its out argument alone.
+/// Parses the body, turns a SOAP fault into an exception, and extracts the result of the operation. It has no state, so any
+/// number of threads may use one handler. A call that throws does not change its out argument.
 ///
-/// All throw `InvalidCredentialsException` when the service refused the caller's credentials; `SsoException` for every
-/// other fault, for what is not well-formed XML, and for a response of another form; `ParseException` for a fault code
-/// whose prefix is not bound; `Tarvel::Xml::Security::XmlSecurityException` for an assertion that has no canonical form.
+/// All functions throw
+/// - `InvalidCredentialsException` when the service refused the caller's credentials,
+/// - `SsoException` for every other fault, for text that is not well-formed XML, and for a response of another form,
+/// - `ParseException` for a fault code whose prefix is not bound,
+/// - `Tarvel::Xml::Security::XmlSecurityException` for an assertion that has no canonical form.
 class ResponseHandlerImpl final : public ResponseHandler {
 public:
   void HandleAcquireTokenResponse(Tarvel::Reader *response, std::string &tokenXml) const override;

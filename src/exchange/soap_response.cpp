@@ -3,9 +3,8 @@
 #include "exchange/soap_response.h"
 
 #include "model/namespaces.h"
-#include "xml/node_text.h"
-#include "xml/parse_xml.h"
 #include "xml/qualified_name.h"
+#include "xml/xml_text.h"
 
 #include <ssoclient/exceptions.h>
 #include <tarvel/xml/document.h>
@@ -30,14 +29,14 @@ struct FaultName {
   std::string_view localName;
 };
 
-/// What services answer when it is the caller's credentials that they refuse.
+/// The fault codes with which services refuse the caller's credentials.
 constexpr FaultName AUTHENTICATION_FAULTS[] = {
     {Namespaces::WST, "FailedAuthentication"},
     {Namespaces::WST, "InvalidSecurityToken"},
     {Namespaces::WSSE, "InvalidSecurityToken"},
 };
 
-bool MeansFailedAuthentication(const QName &faultCode) {
+bool IsAuthenticationFailure(const QName &faultCode) {
   return std::any_of(std::begin(AUTHENTICATION_FAULTS), std::end(AUTHENTICATION_FAULTS), [&](const FaultName &name) {
     return faultCode.namespaceUri == name.namespaceUri && faultCode.localName == name.localName;
   });
@@ -49,7 +48,7 @@ bool IsUtf8(std::string charset) {
   return charset == "utf-8" || charset == "utf8";
 }
 
-/// Says which charset was declared, if any but UTF-8: that may be all that is wrong.
+/// The declared charset unless it is UTF-8, because it may be the only thing that is wrong.
 std::string DescribeCharset(const Tarvel::Reader &response) {
   const std::string charset = response.GetDeclaredCharset();
   return charset.empty() || IsUtf8(charset) ? "" : " (charset " + charset + ")";
@@ -82,7 +81,7 @@ void CheckSoapFault(const ElementNode &envelope) {
   QName name;
   ResolveQName(*faultCode, codeText->GetValue(), Namespaces::SOAPENV, name);
   const std::string faultString = GetText(GetTextNode(fault->FindChildElement("faultstring")));
-  if (MeansFailedAuthentication(name)) {
+  if (IsAuthenticationFailure(name)) {
     throw InvalidCredentialsException("Authentication failed" + (faultString.empty() ? "" : ": " + faultString));
   }
   throw SsoException("Unexpected SOAP fault: " + GetText(codeText) + "; request failed.");

@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// From the bytes of a response to its elements: the document, and the fault that it may hold.
+/// The document of a response, and the SOAP fault that may be in it.
 
 #pragma once
 
@@ -13,17 +13,19 @@
 
 namespace SsoClient {
 
-/// The document element of what `response` holds; the reference keeps the whole tree.
-/// @throws SsoException when it is not well-formed XML; the message ends in the charset that the response declares, unless
-///         that is UTF-8.
+/// The document element of the response. The reference holds the whole tree.
+/// @throws SsoException when the response is not well-formed XML. The message ends with the charset that the response
+///         declares, unless that is UTF-8.
 Tarvel::Ref<const Tarvel::Xml::ElementNode> ParseResponseDocument(Tarvel::Reader &response);
 
-/// Returns when there is no SOAP 1.1 fault in the body of `envelope`.
-/// @throws InvalidCredentialsException for a fault that says that authentication failed, SsoException for every other
-///         fault, ParseException for a fault code whose prefix is not bound.
+/// Checks that there is no SOAP 1.1 fault in the body of `envelope`.
+/// @throws InvalidCredentialsException for a fault that says that authentication failed.
+/// @throws SsoException for every other fault.
+/// @throws ParseException for a fault code whose prefix is not bound.
 void CheckSoapFault(const Tarvel::Xml::ElementNode &envelope);
 
-/// Walks down from `start` by local names, to the first child of each name. Null when a step is missing, or `start` is.
+/// Follows a path of local names down from `start`, to the first child with each name. Null when there is no such child, and
+/// when `start` is null.
 const Tarvel::Xml::ElementNode *FindDescendant(const Tarvel::Xml::ElementNode *start,
                                                std::initializer_list<std::string_view> localNames) noexcept;
 

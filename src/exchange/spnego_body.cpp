@@ -24,7 +24,7 @@ XMLBodyBuilderContinuedSPNego::XMLBodyBuilderContinuedSPNego(const std::string &
     : m_contextId(contextId), m_leg(leg) {}
 
 void XMLBodyBuilderContinuedSPNego::build(Tarvel::Ref<Tarvel::Xml::ElementNode> &out) const {
-  // The prefix is the one that the envelope's body declares.
+  // The body of the envelope declares the prefix.
   XMLCompositeBuilder response(ElementBuilder("wst", "RequestSecurityTokenResponse"));
   response.Add(WstSPNegoBinExchangeBuilder(m_leg));
   response.build(out);

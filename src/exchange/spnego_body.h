@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// The request bodies of an SPNEGO negotiation's legs.
+/// The request bodies of the legs of an SPNEGO negotiation.
 
 #pragma once
 
@@ -15,7 +15,7 @@
 
 namespace SsoClient {
 
-/// The first leg: an issue request that ends in the leg. Each build gives it a new `Context`, "urn:uuid:" and a UUID.
+/// The first leg: an issue request whose last element is the leg. Each build gives it a new `Context`: "urn:uuid:" and a UUID.
 class XMLBodyBuilderInitialSPNego final : public XMLBaseBuilder {
 public:
   XMLBodyBuilderInitialSPNego(SamlToken::ConfirmationType confirmation, const TokenSpec &spec,
@@ -29,7 +29,7 @@ private:
   std::vector<std::uint8_t> m_leg;
 };
 
-/// A further leg: sent as a response element, in the `Context` that the service gave the negotiation.
+/// A further leg: a response element with the `Context` that the service has chosen for the negotiation.
 class XMLBodyBuilderContinuedSPNego final : public XMLBaseBuilder {
 public:
   XMLBodyBuilderContinuedSPNego(const std::string &contextId, const std::vector<std::uint8_t> &leg);

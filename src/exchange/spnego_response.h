@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// `SPNegoResponse`, what the service's answers to the legs of one negotiation yield.
+/// `SPNegoResponse`, the service's response to a leg of a negotiation.
 
 #pragma once
 
@@ -10,11 +10,11 @@
 
 namespace SsoClient {
 
-/// One record goes through all legs of a negotiation.
+/// All legs of a negotiation use the same record.
 struct SPNegoResponse {
   std::string contextId;         ///< the negotiation's identifier; empty until the service returns one
   std::vector<std::uint8_t> leg; ///< the service's GSS output token of this leg; empty when it sent none
-  std::string tokenXml;          ///< the issued assertion; empty while the negotiation goes on
+  std::string tokenXml;          ///< the issued assertion; empty until the negotiation is complete
 };
 
 } // namespace SsoClient

@@ -11,7 +11,7 @@ namespace SsoClient::InternalApi {
 
 namespace {
 
-/// 40 seconds: a leg is answered from what the service holds, so this is a sixth of what other requests may take.
+/// 40 seconds, a sixth of the time of other requests: a service answers a leg without asking other services.
 constexpr std::int64_t LEG_TIMEOUT_MICROSECONDS = 40000000;
 
 } // namespace
@@ -19,7 +19,7 @@ constexpr std::int64_t LEG_TIMEOUT_MICROSECONDS = 40000000;
 std::shared_ptr<GssNegotiationContext> CreateGssNegotiationContext(const SecurityTokenServiceConfig &config,
                                                                    const TokenSpec &spec) {
   auto requestBuilder = std::make_shared<const RequestBuilderImpl>(config.holderOfKeyConfig);
-  // Without the flag: a negotiation goes to the very host that its tickets name.
+  // Without `useDomainControllerName`: the Kerberos ticket is for the host in the address.
   const HttpsClient client(config.stsUrl, Tarvel::Ref<Tarvel::Ssl::SSLContext>(config.sslContext), config.sslParameter,
                            LEG_TIMEOUT_MICROSECONDS);
   auto responseHandler = std::make_shared<const ResponseHandlerImpl>();

@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// `GssNegotiationContextImpl`, the one implementation of `GssNegotiationContext`.
+/// `GssNegotiationContextImpl`, the implementation of `GssNegotiationContext`.
 
 #pragma once
 
@@ -18,10 +18,10 @@
 
 namespace SsoClient::InternalApi {
 
-/// The first leg starts a negotiation; each later one continues it, as long as the service names its context.
+/// The first leg starts a negotiation. Each later leg continues it, as long as the service returns a context identifier.
 class GssNegotiationContextImpl final : public virtual GssNegotiationContext {
 public:
-  /// @throws Tarvel::InvalidArgumentException when there is no certificate: no token could be accepted at the end.
+  /// @throws Tarvel::InvalidArgumentException when there is no certificate, because no token could be accepted then.
   GssNegotiationContextImpl(const TokenSpec &spec, std::shared_ptr<const RequestBuilder> requestBuilder,
                             std::shared_ptr<TransportSession> session,
                             std::shared_ptr<const ResponseHandler> responseHandler,
@@ -33,7 +33,7 @@ private:
   SPNegoResponse Exchange(const std::vector<std::uint8_t> &leg) const;
 
   TokenSpec m_spec;
-  std::string m_contextId; // empty before the first leg, then what the service said last
+  std::string m_contextId; // empty before the first leg, then the last one that the service returned
   std::shared_ptr<const RequestBuilder> m_requestBuilder;
   std::shared_ptr<TransportSession> m_session;
   std::shared_ptr<const ResponseHandler> m_responseHandler;

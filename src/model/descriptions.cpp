@@ -12,8 +12,8 @@ namespace SsoClient {
 using Tarvel::DatePrintFormatter;
 using Tarvel::MessageFormatter;
 
-// The texts below are read by machine: their missing blanks and brackets, and the label "source" of an attribute's
-// name, must stay as they are.
+// Programs read the texts below: their missing blanks and brackets, and the label "source" before the name of an attribute,
+// must stay as they are.
 
 std::string WriteDelegate(const Delegate *delegate) {
   return delegate->subject.ToString() + " at " + delegate->delegationInstant.ToString();
@@ -38,16 +38,13 @@ std::string WriteTokenSpec(const TokenSpec &spec) {
 }
 
 std::string CreateRedactedDescription(const SamlToken &token) {
-  std::vector<PrincipalId> groups;
-  token.GetGroups(groups);
-  std::vector<Delegate> delegationChain;
-  token.GetDelegationChain(delegationChain);
   return MessageFormatter::ASPrint(
       "SamlToken [subject=%1, groups=[%2], delegationChain=[%3], startTime=%4, expirationTime=%5, renewable=%6, "
       "delegable=%7, isSolution=%8,confirmationType=%9]",
-      &token.GetSubject(), AsString(groups, &PrincipalId::ToString), AsString(delegationChain, WriteDelegate),
-      DatePrintFormatter::Format(token.GetStartDate()), DatePrintFormatter::Format(token.GetEndDate()),
-      token.IsRenewable(), token.IsDelegable(), token.IsSolution(), token.GetConfirmationMethod());
+      &token.GetSubject(), AsString(token.GetGroups(), &PrincipalId::ToString),
+      AsString(token.GetDelegationChain(), WriteDelegate), DatePrintFormatter::Format(token.GetStartDate()),
+      DatePrintFormatter::Format(token.GetEndDate()), token.IsRenewable(), token.IsDelegable(), token.IsSolution(),
+      token.GetConfirmationMethod());
 }
 
 } // namespace SsoClient

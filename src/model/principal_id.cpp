@@ -7,10 +7,17 @@
 
 namespace SsoClient {
 
-using Tarvel::StringUtil;
+namespace {
+
+/// The form of a name or a domain in which letter case makes no difference.
+std::string FoldCase(const std::string &text) {
+  return Tarvel::StringUtil::ToUpper(text);
+}
+
+} // namespace
 
 std::string PrincipalId::ToString() const {
-  // No blank after "Domain:"; who reads the logs by machine relies on it.
+  // There is no blank after "Domain:" because programs that read the logs rely on that.
   return Tarvel::MessageFormatter::ASPrint("{Name: %1; Domain:%2}", name, domain);
 }
 
@@ -18,12 +25,16 @@ bool operator==(const PrincipalId &left, const PrincipalId &right) {
   if (&left == &right) {
     return true;
   }
-  return StringUtil::ToUpper(left.name) == StringUtil::ToUpper(right.name) &&
-         StringUtil::ToUpper(left.domain) == StringUtil::ToUpper(right.domain);
+  return FoldCase(left.name) == FoldCase(right.name) && FoldCase(left.domain) == FoldCase(right.domain);
 }
 
 bool operator!=(const PrincipalId &left, const PrincipalId &right) {
   return !(left == right);
+}
+
+bool PrincipalIdLess::operator()(const PrincipalId &left, const PrincipalId &right) const {
+  const int order = FoldCase(left.name).compare(FoldCase(right.name));
+  return order != 0 ? order < 0 : FoldCase(left.domain) < FoldCase(right.domain);
 }
 
 std::string FormatMessageArgument(const PrincipalId *principal) {
@@ -31,3 +42,10 @@ std::string FormatMessageArgument(const PrincipalId *principal) {
 }
 
 } // namespace SsoClient
+
+std::size_t std::hash<SsoClient::PrincipalId>::operator()(const SsoClient::PrincipalId &principal) const {
+  // The product with an odd number makes the two parts differ in weight: swapping name and domain changes the hash.
+  constexpr std::size_t ODD = 31;
+  const std::hash<std::string> hashOf;
+  return hashOf(SsoClient::FoldCase(principal.name)) * ODD + hashOf(SsoClient::FoldCase(principal.domain));
+}

@@ -1,14 +1,15 @@
 // SPDX-License-Identifier: Apache-2.0
-// The asynchronous half of `SecurityTokenServiceImpl`: each operation packs up its synchronous twin.
+// The asynchronous operations of `SecurityTokenServiceImpl`: each queues a call of its synchronous counterpart.
 #include "service/security_token_service_impl.h"
 #include "service/sync_to_async_call.h"
-#include "service/wiped_text.h"
+
+#include <tarvel/core/secret_text.h>
 
 namespace SsoClient {
 
 void SecurityTokenServiceImpl::AcquireTokenAsync(const std::string &username, const std::string &password,
                                                  const TokenSpec &spec, const TokenCompletion &completion) const {
-  SyncToAsyncCall([service = ShareCopy(), username, secret = WipedText(password),
+  SyncToAsyncCall([service = ShareCopy(), username, secret = Tarvel::SecretText(password),
                    spec] { return service->AcquireToken(username, secret.Get(), spec); },
                   completion);
 }

@@ -11,7 +11,7 @@ namespace SsoClient {
 
 namespace {
 
-/// Four minutes. A service may have to ask others before it answers, so this is long, and not configurable.
+/// Four minutes, and not configurable. This is long because a service may have to ask other services before it answers.
 constexpr std::int64_t REQUEST_TIMEOUT_MICROSECONDS = 240000000;
 
 } // namespace

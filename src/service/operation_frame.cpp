@@ -20,7 +20,7 @@ OperationFrame::~OperationFrame() {
     LogInternal(getLogger(), LOG_LEVEL_OPERATION, "opId=%1 END operation SecurityTokenServiceImpl::%2", m_opId,
                 m_operationName);
   } catch (...) {
-    // Out of memory: the line is lost, the operation's own outcome is not.
+    // Out of memory: the line is lost, but the outcome of the operation is not.
   }
 }
 

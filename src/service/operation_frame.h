@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// `OperationFrame`, which brackets an operation in the log.
+/// `OperationFrame`, which logs the start and the end of an operation.
 
 #pragma once
 
@@ -8,7 +8,8 @@
 
 namespace SsoClient {
 
-/// Logs the start when it is made and the end when it goes, by return or by exception; one new UUID ties the two.
+/// Logs the start when it is created and the end when it is destroyed, after a return or an exception. Both lines have the
+/// same new UUID.
 class OperationFrame {
 public:
   explicit OperationFrame(const std::string &operationName);

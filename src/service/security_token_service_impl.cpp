@@ -18,7 +18,7 @@ namespace {
 using Tarvel::Ref;
 using Tarvel::Service::LogInternal;
 
-/// Asked before a description is built: that costs far more than the line.
+/// Checked before a description is made: making one costs far more than the log call.
 bool IsLoggingOperations() {
   return getLogger().GetLevel() >= LOG_LEVEL_OPERATION;
 }
@@ -34,10 +34,10 @@ void LogRequestedSpec(const TokenSpec &spec) {
   }
 }
 
-/// The token is out; the handler only gets to see how the service ended the negotiation.
+/// The token is issued already. The handler only sees the last leg of the service.
 void HandOverFinalLeg(NegotiationHandler &handler, const std::vector<std::uint8_t> &serviceLeg) {
   const std::shared_ptr<std::vector<std::uint8_t>> userLeg = handler.NegotiateLeg(serviceLeg);
-  // Deliberately this way round: a handler that answers the final leg passes in silence, one that does not is named.
+  // The condition is inverted on purpose: a handler that answers the final leg is not logged, one that does not is.
   if (!userLeg || userLeg->empty()) {
     LogInternal(getLogger(), LOG_LEVEL_CONTRACT_WARNING,
                 "GSS contract error: non-empty user leg after negotiation is complete");
@@ -65,9 +65,7 @@ std::shared_ptr<const SamlToken> SecurityTokenServiceImpl::AcquireToken(const st
   LogOperation("SecurityTokenServiceImpl::AcquireToken sending request");
   const Ref<Tarvel::Reader> response = Send(std::move(request));
   LogOperation("SecurityTokenServiceImpl::AcquireToken processing response");
-  std::string tokenXml;
-  m_responseHandler->HandleAcquireTokenResponse(response.get(), tokenXml);
-  return ToSamlToken(tokenXml);
+  return AcquireFrom(response);
 }
 
 std::shared_ptr<const SamlToken> SecurityTokenServiceImpl::AcquireTokenByGSS(const TokenSpec &spec,
@@ -84,10 +82,7 @@ std::shared_ptr<const SamlToken> SecurityTokenServiceImpl::AcquireTokenByCertifi
   LogRequestedSpec(spec);
   Request request;
   m_requestBuilder->BuildCertificateTokenRequest(spec, request);
-  const Ref<Tarvel::Reader> response = Send(std::move(request));
-  std::string tokenXml;
-  m_responseHandler->HandleAcquireTokenResponse(response.get(), tokenXml);
-  return ToSamlToken(tokenXml);
+  return AcquireFrom(Send(std::move(request)));
 }
 
 std::shared_ptr<const SamlToken> SecurityTokenServiceImpl::AcquireTokenByToken(const SamlToken &token,
@@ -98,10 +93,7 @@ std::shared_ptr<const SamlToken> SecurityTokenServiceImpl::AcquireTokenByToken(c
   }
   Request request;
   m_requestBuilder->BuildExchangeTokenRequest(token, spec, request);
-  const Ref<Tarvel::Reader> response = Send(std::move(request));
-  std::string tokenXml;
-  m_responseHandler->HandleAcquireTokenResponse(response.get(), tokenXml);
-  return ToSamlToken(tokenXml);
+  return AcquireFrom(Send(std::move(request)));
 }
 
 bool SecurityTokenServiceImpl::ValidateSubject(const SamlToken &token) const {
@@ -125,9 +117,13 @@ std::shared_ptr<const SamlToken> SecurityTokenServiceImpl::RenewToken(const Saml
   }
   Request request;
   m_requestBuilder->BuildRenewRequest(token, lifetimeSec, request);
-  const Ref<Tarvel::Reader> response = Send(std::move(request));
+  return AcquireFrom(Send(std::move(request)), &ResponseHandler::HandleRenewTokenResponse);
+}
+
+std::shared_ptr<const SamlToken> SecurityTokenServiceImpl::AcquireFrom(const Ref<Tarvel::Reader> &response,
+                                                                       ReadTokenXml readTokenXml) const {
   std::string tokenXml;
-  m_responseHandler->HandleRenewTokenResponse(response.get(), tokenXml);
+  ((*m_responseHandler).*readTokenXml)(response.get(), tokenXml);
   return ToSamlToken(tokenXml);
 }
 
@@ -162,9 +158,9 @@ void SecurityTokenServiceImpl::ContinueSPNegotiation(TransportSession &session, 
 }
 
 Ref<Tarvel::Reader> SecurityTokenServiceImpl::Send(Request &&request) const {
-  const Request ours = std::move(request); // which is overwritten when we return
+  const Request own = std::move(request); // wiped on return
   Ref<Tarvel::Reader> response;
-  m_transport->CreateSession()->SendRequest(ours, response);
+  m_transport->CreateSession()->SendRequest(own, response);
   return response;
 }
 

@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// `SecurityTokenServiceImpl`, which takes each operation down one road through its collaborators.
+/// `SecurityTokenServiceImpl`, which runs each operation in the same steps: compose, send, read, verify.
 
 #pragma once
 
@@ -20,8 +20,8 @@
 
 namespace SsoClient {
 
-/// Composes nothing, sends nothing and reads nothing itself. Copies share the collaborators, which therefore must be safe
-/// on any thread; queued work runs on a copy, so it outlives the service that it was given to.
+/// Coordinates three collaborators, which compose requests, send them and read responses. Copies share the collaborators,
+/// which must be safe on any thread. An asynchronous operation runs on a copy, so it may outlive the service that started it.
 class SecurityTokenServiceImpl final : public SecurityTokenService {
 public:
   SecurityTokenServiceImpl(std::shared_ptr<const RequestBuilder> requestBuilder,
@@ -51,21 +51,27 @@ public:
                        const TokenCompletion &completion) const override;
 
   /// The verified token in `xml`; null when `xml` is empty.
-  /// @throws what `CreateSamlToken` throws, but SsoException in place of ParseException, with the same message.
+  /// @throws what `CreateSamlToken` throws, but SsoException with the same message instead of ParseException.
   std::shared_ptr<const SamlToken> ToSamlToken(const std::string &xml) const;
 
-  /// Sends the first leg of a negotiation and puts the service's answer into `spnego`.
+  /// Sends the first leg of a negotiation and sets `spnego` to the service's response.
   void StartSPNegotiation(TransportSession &session, const std::vector<std::uint8_t> &leg, const TokenSpec &spec,
                           SPNegoResponse &spnego) const;
 
-  /// The same for a later leg. `contextId` may be the text in `spnego`.
+  /// The same for a later leg. `contextId` may refer to the text in `spnego`.
   void ContinueSPNegotiation(TransportSession &session, const std::vector<std::uint8_t> &leg,
                              const std::string &contextId, SPNegoResponse &spnego) const;
 
 private:
-  /// Posts on a session of its own. Session and request are gone when this returns, so that no password in the request
-  /// waits until the response has been judged.
+  using ReadTokenXml = void (ResponseHandler::*)(Tarvel::Reader *, std::string &) const;
+
+  /// Posts in a new session. Session and request are destroyed before this returns, so that a password in the request does
+  /// not stay in memory while the response is processed.
   Tarvel::Ref<Tarvel::Reader> Send(Request &&request) const;
+  /// The verified token that `readTokenXml` finds in `response`; null when the text that it finds is empty.
+  std::shared_ptr<const SamlToken>
+  AcquireFrom(const Tarvel::Ref<Tarvel::Reader> &response,
+              ReadTokenXml readTokenXml = &ResponseHandler::HandleAcquireTokenResponse) const;
   void SendLeg(TransportSession &session, const Request &request, SPNegoResponse &spnego) const;
   /// Exchanges legs until the service issues a token or something throws.
   void Negotiate(const TokenSpec &spec, NegotiationHandler &handler, SPNegoResponse &spnego) const;

@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// The one way in which a synchronous operation becomes an asynchronous one.
+/// Runs a synchronous operation on the thread pool and reports how it ended.
 
 #pragma once
 
@@ -13,14 +13,14 @@
 
 namespace SsoClient {
 
-/// Stands for a reference argument in a call that runs later, and keeps the object alive until the call is destroyed.
+/// A reference argument of a call that runs later. It keeps the object alive until the call is destroyed.
 template <typename T>
 class PassByRefHelper {
 public:
   explicit PassByRefHelper(std::shared_ptr<T> object) : m_object(std::move(object)) {}
 
-  /// @throws Tarvel::InvalidArgumentException when there is no object; here, where the operation runs, so that its caller
-  ///         hears of it as of any other failure.
+  /// @throws Tarvel::InvalidArgumentException when there is no object. It is thrown here, where the operation runs, so that
+  ///         it is reported like any other failure.
   operator T &() const {
     if (!m_object) {
       throw Tarvel::InvalidArgumentException("a required object may not be NULL");
@@ -32,9 +32,9 @@ private:
   std::shared_ptr<T> m_object;
 };
 
-/// Runs `call` and tells `callback` how it ended: its result and null, or `failureValue` and the exception, which is good
-/// during the callback only. What `callback` throws leaves this function, and so does what `call` throws that is no
-/// `Tarvel::Exception`; in that case `callback` is not called.
+/// Runs `call`, then `callback` with the result and null, or with `failureValue` and the exception, which is valid during the
+/// callback only. What `callback` throws leaves this function. So does an exception of `call` that is not a
+/// `Tarvel::Exception`; `callback` is then not called.
 template <typename Call, typename Callback, typename FailureValue>
 void SyncCallToResultFunc(const Call &call, const Callback &callback, const FailureValue &failureValue) {
   FailureValue result = failureValue;
@@ -44,20 +44,20 @@ void SyncCallToResultFunc(const Call &call, const Callback &callback, const Fail
     callback(failureValue, &failure);
     return;
   }
-  // Not within the block above: an exception of the callback is no failure of the call, to be reported to it again.
+  // Outside the block above: an exception of the callback is not a failure of the call, and is not reported to the callback.
   callback(result, nullptr);
 }
 
 /// Queues `SyncCallToResultFunc` of copies of the three on the platform's thread pool and returns at once. The copies are
 /// destroyed when the work has run.
-/// @throws Tarvel::InvalidStateException when the pool has no thread and can start none; nothing is called then.
+/// @throws Tarvel::InvalidStateException when the pool has no thread and cannot start one. Nothing is called then.
 template <typename Call, typename Callback, typename FailureValue>
 void SyncToAsyncCall(const Call &call, const Callback &callback, const FailureValue &failureValue) {
   Tarvel::System::GetThreadPool()->QueueWorkItem(
       [call, callback, failureValue] { SyncCallToResultFunc(call, callback, failureValue); });
 }
 
-/// The same for calls whose result is a token; null tells of failure.
+/// The same for calls whose result is a token. The failure value is null.
 template <typename Call, typename Callback>
 void SyncToAsyncCall(const Call &call, const Callback &callback) {
   SyncToAsyncCall(call, callback, std::shared_ptr<const SamlToken>());

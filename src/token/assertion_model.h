@@ -2,8 +2,8 @@
 /// @file
 /// The parsed form of one SAML 2.0 assertion: a record for each schema type of the accepted profile.
 ///
-/// The records, and their fields, are named after the schema's types, elements and attributes. The parser fills them, the
-/// checks and the token read them; they live only while a token is made.
+/// The records and their fields have the names of the schema's types, elements and attributes. The parser fills them, and the
+/// checks and the token read them. They exist only while a token is made.
 
 #pragma once
 
@@ -37,7 +37,7 @@ struct SubjectConfirmationDataType {
 
 struct SubjectConfirmationType {
   SamlToken::ConfirmationType Method = SamlToken::BEARER;
-  boost::optional<NameIDType> NameID; ///< the delegate that confirms the subject
+  boost::optional<NameIDType> NameID; ///< the delegate, if there is one
   SubjectConfirmationDataType SubjectConfirmationData;
 };
 

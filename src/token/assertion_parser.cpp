@@ -4,7 +4,6 @@
 
 #include "model/namespaces.h"
 #include "token/conditions_parser.h"
-#include "token/name_id_parser.h"
 #include "token/statement_parser.h"
 #include "token/subject_parser.h"
 #include "token/token_signature.h"

@@ -9,12 +9,12 @@
 
 namespace SsoClient {
 
-/// Reads the assertion that the cursor stands on and moves the cursor to the next node. Only the form that the token
-/// service issues is accepted: elements in their fixed order, with their fixed attributes, and none besides.
+/// Reads the assertion at the cursor and moves the cursor to the next node. Only the form that the token service issues is
+/// accepted: these elements in this order with these attributes, and no others.
 ///
-/// This and the other parsing functions share one pattern: the element's name, its attributes, its children in order, nothing
-/// after them; then on to the next sibling. The first failure ends the parse and leaves the record partly filled.
-/// @throws ParseException for everything else.
+/// All parsing functions have the same steps: check the name of the element, its attributes, its children in order, and that
+/// nothing follows them; then move to the next sibling. The first failure ends the parse and leaves the record partly filled.
+/// @throws ParseException for any other form.
 void ParseSamlAssertionElement(NodeFilterIterator &iterator, SamlAssertionType &assertion);
 
 } // namespace SsoClient

@@ -3,8 +3,7 @@
 #include "token/conditions_parser.h"
 
 #include "model/namespaces.h"
-#include "token/name_id_parser.h"
-#include "token/schema_names.h"
+#include "token/subject_parser.h"
 #include "xml/qualified_name.h"
 #include "xml/strict_checks.h"
 
@@ -19,7 +18,10 @@ namespace {
 
 using Tarvel::Xml::ElementNode;
 
-/// The `saml:Condition` of that type, or null when the cursor stands on something else.
+constexpr QNameView DELEGATION_RESTRICTION_TYPE(Namespaces::DELEGATION, "DelegationRestrictionType");
+constexpr QNameView RENEW_RESTRICTION_TYPE(Namespaces::RSA_SAML2, "RenewRestrictionType");
+
+/// The `saml:Condition` of that type at the cursor, or null when another node is there.
 const ElementNode *ConditionOfType(const NodeFilterIterator &iterator, const QNameView &type) {
   const ElementNode *const element = IteratorToElement(iterator);
   return ElementQNameIs(element, "Condition", Namespaces::SAML) && ElementXsiTypeIs(*element, type) ? element : nullptr;
@@ -33,7 +35,7 @@ void ParseAudience(NodeFilterIterator &iterator, std::set<std::string> &audience
   iterator.MoveToSibling();
 }
 
-/// Reads the restriction under the cursor, if it is of a kind that `conditions` has not got yet.
+/// Reads the restriction at the cursor if its kind is known and not yet in `conditions`.
 bool TryParseRestriction(NodeFilterIterator &iterator, ConditionsType &conditions) {
   return (!conditions.DelegationRestriction &&
           TryParseDelegationRestriction(iterator, conditions.DelegationRestriction)) ||
@@ -69,11 +71,11 @@ void ParseConditionsElement(NodeFilterIterator &iterator, ConditionsType &condit
 
 bool TryParseDelegationRestriction(NodeFilterIterator &iterator,
                                    boost::optional<DelegationRestrictionType> &restriction) {
-  const ElementNode *const element = ConditionOfType(iterator, SchemaNames::DELEGATION_RESTRICTION_TYPE);
+  const ElementNode *const element = ConditionOfType(iterator, DELEGATION_RESTRICTION_TYPE);
   if (!element) {
     return false;
   }
-  RequireElementAttributesQNames(*element, {SchemaNames::XSI_TYPE}, {});
+  RequireElementAttributesQNames(*element, {XSI_TYPE}, {});
   restriction.emplace();
   NodeFilterIterator child = iterator.GetChild();
   do {
@@ -122,15 +124,15 @@ bool TryParseProxyRestriction(NodeFilterIterator &iterator, boost::optional<Prox
 }
 
 bool TryParseRenewRestriction(NodeFilterIterator &iterator, boost::optional<RenewRestrictionType> &restriction) {
-  const ElementNode *const element = ConditionOfType(iterator, SchemaNames::RENEW_RESTRICTION_TYPE);
+  const ElementNode *const element = ConditionOfType(iterator, RENEW_RESTRICTION_TYPE);
   if (!element) {
     return false;
   }
-  RequireElementAttributesQNames(*element, {SchemaNames::XSI_TYPE},
+  RequireElementAttributesQNames(*element, {XSI_TYPE},
                                  {LocalName("Count"), LocalName("Postdatable"), LocalName("RenewExpired")});
   restriction.emplace();
   GetULongOptionalAttribute(*element, "Count", restriction->Count);
-  // Content would be signed and not looked at.
+  // Content would be signed, but ignored.
   RequireEmptyElement(iterator);
   iterator.MoveToSibling();
   return true;

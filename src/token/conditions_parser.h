@@ -2,7 +2,7 @@
 /// @file
 /// Readers of the conditions under which a token is valid.
 ///
-/// A `TryParse` function answers whether the cursor stood on its element; when it did not, cursor and record are left alone.
+/// A `TryParse` function returns whether its element was at the cursor. If not, it does not change cursor or record.
 
 #pragma once
 
@@ -13,7 +13,7 @@
 
 namespace SsoClient {
 
-/// Reads a `saml:Conditions`: its restrictions in any order, each at most once.
+/// Reads a `saml:Conditions`: restrictions in any order, each kind at most once.
 void ParseConditionsElement(NodeFilterIterator &iterator, ConditionsType &conditions);
 
 /// Reads a `saml:Condition` of the type DelegationRestrictionType.

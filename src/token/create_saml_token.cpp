@@ -16,7 +16,7 @@ using Tarvel::Crypto::CertificateList;
 using Tarvel::Xml::ElementNode;
 using Tarvel::Xml::Security::KeyInfoResolver;
 
-/// Resolves keys from `trusted` alone; null references trust nothing.
+/// Resolves only to keys of `trusted`. Null references are ignored.
 Ref<KeyInfoResolver> ResolverFor(const CertificateList &trusted) {
   return Tarvel::Xml::Security::CreateTrustSetKeyResolver(trusted);
 }

@@ -4,11 +4,9 @@
 
 #include "token/assertion_parser.h"
 #include "token/token_checks.h"
-#include "xml/parse_xml.h"
+#include "xml/xml_text.h"
 
 #include <ssoclient/exceptions.h>
-#include <tarvel/io/writer.h>
-#include <tarvel/xml/security/canonicalizer.h>
 #include <tarvel/xml/security/exceptions.h>
 
 #include <memory>
@@ -16,24 +14,11 @@
 
 namespace SsoClient {
 
-namespace {
-
 using Tarvel::Ref;
 using Tarvel::Xml::Document;
 using Tarvel::Xml::ElementNode;
 using Tarvel::Xml::Security::KeyInfoResolver;
 using Tarvel::Xml::Security::Signature;
-
-// The published URI has no "#" at its end; the canonicalizer knows this spelling as the same algorithm.
-constexpr const char *CANONICAL_XML = "http://www.w3.org/TR/2001/REC-xml-c14n-20010315#";
-
-std::string Canonicalize(const ElementNode &element) {
-  const Ref<Tarvel::StringWriter> writer = Tarvel::CreateStringWriter();
-  Tarvel::Xml::Security::CreateCanonicalizer(CANONICAL_XML)->Canonicalize(element, *writer);
-  return writer->TakeText();
-}
-
-} // namespace
 
 SamlTokenImpl::SamlTokenImpl(const std::string &xml, const KeyInfoResolver &resolver, std::int64_t clockToleranceSec) {
   {
@@ -41,18 +26,18 @@ SamlTokenImpl::SamlTokenImpl(const std::string &xml, const KeyInfoResolver &reso
     ParseXML(xml, document);
     InitializeFromDom(document ? document->GetDocumentElement() : nullptr, resolver, clockToleranceSec);
   }
-  m_xml = xml; // not before the tree and its own copy of the text are gone: a large document needs one copy at a time
+  m_xml = xml; // after the tree and its copy of the text are destroyed: there is one copy of a large text at a time
 }
 
 SamlTokenImpl::SamlTokenImpl(const ElementNode &element, const KeyInfoResolver &resolver,
                              std::int64_t clockToleranceSec)
-    : m_xml(Canonicalize(element)) {
+    : m_xml(CanonicalElementText(element)) {
   InitializeFromDom(&element, resolver, clockToleranceSec);
 }
 
 void SamlTokenImpl::InitializeFromDom(const ElementNode *element, const KeyInfoResolver &resolver,
                                       std::int64_t clockToleranceSec) {
-  // The filter outlives all cursors. So it is shared without a count, which would cost two atomic operations a cursor.
+  // The filter outlives all cursors, so the shared pointer owns nothing: a count would cost two atomic operations per cursor.
   const SkipWsAndCommentsFilter filter;
   NodeFilterIterator iterator(element, std::shared_ptr<const NodeFilter>(std::shared_ptr<void>(), &filter));
   SamlAssertionType assertion;

@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// `SamlTokenImpl`, the one implementation of `SamlToken`.
+/// `SamlTokenImpl`, the implementation of `SamlToken`.
 
 #pragma once
 
@@ -13,16 +13,23 @@
 namespace SsoClient {
 
 /// A token that is complete: its constructors parse, check and verify, or throw as `CreateSamlToken` says. It is made by
-/// `std::make_shared<SamlTokenImpl>`, so that its destructor is found although the interface has no virtual one.
+/// `std::make_shared<SamlTokenImpl>`: the shared pointer then destroys it as what it is, although the interface has no virtual
+/// destructor.
 class SamlTokenImpl final : public SamlToken {
 public:
-  /// From text, which `ToXml` gives back as it is.
+  /// From a text, which `ToXml` returns unchanged.
   SamlTokenImpl(const std::string &xml, const Tarvel::Xml::Security::KeyInfoResolver &resolver,
                 std::int64_t clockToleranceSec);
 
-  /// From an element, whose canonical form `ToXml` gives.
+  /// From an element, of which `ToXml` returns the canonical form.
   SamlTokenImpl(const Tarvel::Xml::ElementNode &element, const Tarvel::Xml::Security::KeyInfoResolver &resolver,
                 std::int64_t clockToleranceSec);
+
+  using SamlToken::GetAdvice;
+  using SamlToken::GetAudience;
+  using SamlToken::GetDelegationChain;
+  using SamlToken::GetFullName;
+  using SamlToken::GetGroups;
 
   const std::string &GetId() const override { return m_facts.id; }
   const Tarvel::System::DateTime &GetStartDate() const override { return m_facts.startDate; }
@@ -44,7 +51,7 @@ public:
   }
   const std::string &ToXml() const override { return m_xml; }
 
-  /// @throws InvalidSignatureException unless `signature` verifies with a key that `resolver` names.
+  /// @throws InvalidSignatureException unless `signature` verifies with one of the keys of `resolver`.
   static void ValidateSignature(const Tarvel::Xml::Security::Signature &signature,
                                 const Tarvel::Xml::Security::KeyInfoResolver &resolver);
 

@@ -3,7 +3,6 @@
 #include "token/statement_parser.h"
 
 #include "model/namespaces.h"
-#include "token/schema_names.h"
 #include "xml/qualified_name.h"
 #include "xml/strict_checks.h"
 
@@ -18,16 +17,16 @@ namespace {
 
 void ParseAttributeValue(NodeFilterIterator &iterator, std::string &value) {
   const ElementNode &element = RequireElementQName(IteratorToElement(iterator), "AttributeValue", Namespaces::SAML);
-  // Services may say the type of a value. It is not looked at: every value is taken as text.
+  // Services may state the type of a value. It is ignored: every value is read as text.
   if (element.GetFirstAttribute()) {
-    RequireElementAttributesQNames(element, {}, {SchemaNames::XSI_TYPE});
+    RequireElementAttributesQNames(element, {}, {XSI_TYPE});
   }
   RequireTextualContent(iterator, value);
   iterator.MoveToSibling();
 }
 
-/// How many attributes a statement may have: each has a name. Room is made for them at once, because a sequence that grows
-/// step by step takes up to three times its size.
+/// An upper limit of the number of attributes: each element with at least one XML attribute is counted. It is reserved at
+/// once, because a sequence that grows step by step needs up to three times the memory.
 std::size_t CountPossibleAttributes(const ElementNode &statement) {
   std::size_t count = 0;
   for (const Tarvel::Xml::Node *child = statement.GetFirstChild(); child; child = child->GetNextSibling()) {

@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// Readers of what an assertion states: advice, authentication and attributes.
+/// Readers of the statements of an assertion: advice, authentication and attributes.
 
 #pragma once
 
@@ -11,7 +11,7 @@
 
 namespace SsoClient {
 
-/// Reads a `saml:Advice`. Answers whether the cursor stood on one; when it did not, cursor and record are left alone.
+/// Reads a `saml:Advice`. Returns whether one was at the cursor. If not, it does not change cursor or record.
 bool TryParseAdviceElement(NodeFilterIterator &iterator, boost::optional<AdviceType> &advice);
 
 /// Reads an `RSAAdvice`, the advice of one source.

@@ -3,8 +3,6 @@
 #include "token/subject_parser.h"
 
 #include "model/namespaces.h"
-#include "token/name_id_parser.h"
-#include "token/schema_names.h"
 #include "xml/qualified_name.h"
 #include "xml/strict_checks.h"
 
@@ -26,6 +24,7 @@ using Tarvel::Ref;
 using Tarvel::Crypto::Certificate;
 using Tarvel::Xml::ElementNode;
 
+constexpr QNameView KEY_INFO_CONFIRMATION_DATA_TYPE(Namespaces::SAML, "KeyInfoConfirmationDataType");
 constexpr std::string_view METHOD_BEARER = "urn:oasis:names:tc:SAML:2.0:cm:bearer";
 constexpr std::string_view METHOD_HOLDER_OF_KEY = "urn:oasis:names:tc:SAML:2.0:cm:holder-of-key";
 
@@ -68,9 +67,9 @@ void ParseX509DataElement(NodeFilterIterator &iterator, Ref<const Certificate> &
 
 void ParseHolderOfKeyData(const NodeFilterIterator &iterator, const ElementNode &element,
                           Ref<const Certificate> &certificate) {
-  RequireElementAttributesQNames(element, {SchemaNames::XSI_TYPE}, {});
+  RequireElementAttributesQNames(element, {XSI_TYPE}, {});
   const std::string_view type = element.FindAttribute(Namespaces::XSI, "type")->GetValue();
-  if (ResolveXsiType(element, type) != SchemaNames::KEY_INFO_CONFIRMATION_DATA_TYPE) {
+  if (ResolveXsiType(element, type) != KEY_INFO_CONFIRMATION_DATA_TYPE) {
     throw ParseException(MessageFormatter::ASPrint("Invalid SubjectConfirmationData type: '%1'", type));
   }
   NodeFilterIterator child = iterator.GetChild();
@@ -79,6 +78,24 @@ void ParseHolderOfKeyData(const NodeFilterIterator &iterator, const ElementNode 
 }
 
 } // namespace
+
+void ParseNameIDType(NodeFilterIterator &iterator, NameIDType &nameId) {
+  const ElementNode &element = *IteratorToElement(iterator);
+  RequireElementAttributesNames(element, {"Format"}, {});
+  nameId.Format = GetTextAttribute(element, "Format");
+  RequireTextualContent(iterator, nameId.value);
+  iterator.MoveToSibling();
+}
+
+void ParseSamlIssuerElement(NodeFilterIterator &iterator, NameIDType &issuer) {
+  RequireElementQName(IteratorToElement(iterator), "Issuer", Namespaces::SAML);
+  ParseNameIDType(iterator, issuer);
+}
+
+void ParseSubjectNameIdElement(NodeFilterIterator &iterator, NameIDType &nameId) {
+  RequireElementQName(IteratorToElement(iterator), "NameID", Namespaces::SAML);
+  ParseNameIDType(iterator, nameId);
+}
 
 void ParseSubjectElement(NodeFilterIterator &iterator, SubjectType &subject) {
   RequireNoAttributes(RequireElementQName(IteratorToElement(iterator), "Subject", Namespaces::SAML));

@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// Readers of the subject and of how it is confirmed.
+/// Readers of the elements that name a party: the issuer, the subject, and the confirmation of the subject.
 
 #pragma once
 
@@ -9,17 +9,27 @@
 
 namespace SsoClient {
 
+/// Reads attributes and text of an element of the type NameIDType, whatever its name. The cursor must be on an element.
+void ParseNameIDType(NodeFilterIterator &iterator, NameIDType &nameId);
+
+/// Reads a `saml:Issuer`.
+void ParseSamlIssuerElement(NodeFilterIterator &iterator, NameIDType &issuer);
+
+/// Reads a `saml:NameID`.
+void ParseSubjectNameIdElement(NodeFilterIterator &iterator, NameIDType &nameId);
+
 /// Reads a `saml:Subject`: one name and one confirmation.
 void ParseSubjectElement(NodeFilterIterator &iterator, SubjectType &subject);
 
 /// Reads a `saml:SubjectConfirmation` of the method bearer or holder-of-key.
 void ParseSubjectConfirmationElement(NodeFilterIterator &iterator, SubjectConfirmationType &confirmation);
 
-/// Reads a `saml:SubjectConfirmationData` as `method` has it: with an end for bearer, with a certificate for holder-of-key.
+/// Reads a `saml:SubjectConfirmationData`, whose form depends on `method`: bearer has an end of validity, holder-of-key a
+/// certificate.
 void ParseSubjectConfirmationDataElement(NodeFilterIterator &iterator, SamlToken::ConfirmationType method,
                                          SubjectConfirmationDataType &data);
 
-/// Reads a `ds:KeyInfo` with the one certificate in it.
+/// Reads a `ds:KeyInfo` and its only certificate.
 void ParseSubjectConfirmationDataKeyInfoElement(NodeFilterIterator &iterator,
                                                 Tarvel::Ref<const Tarvel::Crypto::Certificate> &certificate);
 

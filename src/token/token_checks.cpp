@@ -6,41 +6,9 @@
 
 #include <ssoclient/exceptions.h>
 
-#include <limits>
-
 namespace SsoClient {
 
 namespace {
-
-constexpr std::int64_t MICROSECONDS_PER_SECOND = 1'000'000;
-constexpr std::int64_t EARLIEST = std::numeric_limits<std::int64_t>::min();
-constexpr std::int64_t LATEST = std::numeric_limits<std::int64_t>::max();
-
-// An absurd tolerance must mean "always" or "never", not wrap around into its opposite: the arithmetic saturates.
-
-std::int64_t ToMicroseconds(std::int64_t seconds) {
-  std::int64_t microseconds = 0;
-  if (__builtin_mul_overflow(seconds, MICROSECONDS_PER_SECOND, &microseconds)) {
-    return seconds < 0 ? EARLIEST : LATEST;
-  }
-  return microseconds;
-}
-
-std::int64_t Later(std::int64_t time, std::int64_t microseconds) {
-  std::int64_t result = 0;
-  if (__builtin_add_overflow(time, microseconds, &result)) {
-    return microseconds < 0 ? EARLIEST : LATEST;
-  }
-  return result;
-}
-
-std::int64_t Earlier(std::int64_t time, std::int64_t microseconds) {
-  std::int64_t result = 0;
-  if (__builtin_sub_overflow(time, microseconds, &result)) {
-    return microseconds < 0 ? LATEST : EARLIEST;
-  }
-  return result;
-}
 
 void CheckVersionAndId(const SamlAssertionType &assertion) {
   if (assertion.Version != "2.0") {
@@ -52,17 +20,16 @@ void CheckVersionAndId(const SamlAssertionType &assertion) {
 }
 
 void CheckValidity(const ConditionsType &conditions, std::int64_t clockToleranceSec) {
-  const std::int64_t notBefore = conditions.NotBefore.GetUtcTime();
-  const std::int64_t notOnOrAfter = conditions.NotOnOrAfter.GetUtcTime();
-  if (notBefore >= notOnOrAfter) {
+  if (!(conditions.NotBefore < conditions.NotOnOrAfter)) {
     throw ParseException("Unsatisfiable token validity conditions: NotBefore must be less than NotOnOrAfter.");
   }
-  const std::int64_t tolerance = ToMicroseconds(clockToleranceSec);
-  const std::int64_t now = Tarvel::System::GetUtcDateTime().GetUtcTime();
-  if (Earlier(notBefore, tolerance) > now) {
+  // Differences of dates, not shifted dates: those would stop at the years 1 and 9999.
+  const std::int64_t tolerance = Tarvel::System::SecondsToMicroseconds(clockToleranceSec);
+  const Tarvel::System::DateTime now = Tarvel::System::GetUtcDateTime();
+  if (conditions.NotBefore.MicrosecondsSince(now) > tolerance) {
     throw ParseException("Token start date is in the future: " + DateTimeFormatter(conditions.NotBefore));
   }
-  if (Later(notOnOrAfter, tolerance) <= now) {
+  if (now.MicrosecondsSince(conditions.NotOnOrAfter) >= tolerance) {
     throw ParseException("The token has expired at: " + DateTimeFormatter(conditions.NotOnOrAfter));
   }
 }

@@ -10,8 +10,8 @@
 
 namespace SsoClient {
 
-/// Judges version, identifier, validity (by the clock, and in itself) and delegation of `assertion`.
-/// @param clockToleranceSec seconds by which the validity window is widened on both sides; a negative number narrows it.
+/// Checks version, identifier, validity and delegation of `assertion`.
+/// @param clockToleranceSec seconds by which the time of validity is extended at both ends; a negative number shortens it
 /// @throws ParseException on the first rule that fails.
 void CheckTokenProperties(const SamlAssertionType &assertion, std::int64_t clockToleranceSec);
 

@@ -21,12 +21,12 @@ constexpr std::string_view GIVEN_NAME = "http://schemas.xmlsoap.org/ws/2005/05/i
 constexpr std::string_view SUR_NAME = "http://schemas.xmlsoap.org/ws/2005/05/identity/claims/surname";
 constexpr std::string_view FORMAT_UPN = "http://schemas.xmlsoap.org/claims/UPN";
 
-/// Whether `separator`, a position in `text` or npos, has something on both sides.
-bool PartsInTwo(const std::string &text, std::size_t separator) {
+/// Whether there is text before and after `separator`, a position in `text` or npos.
+bool HasBothSides(const std::string &text, std::size_t separator) {
   return separator != std::string::npos && separator != 0 && separator + 1 != text.size();
 }
 
-/// Whether a restriction allows it at least once more. One without a number allows nothing.
+/// Whether a restriction allows at least one more use. Without a number it allows none.
 template <typename Restriction>
 bool Allows(const boost::optional<Restriction> &restriction) {
   return restriction && restriction->Count && *restriction->Count != 0;
@@ -49,7 +49,7 @@ void TakeConditions(ConditionsType &conditions, TokenFacts &facts) {
 
 void PopulateTokenAttribute(AttributeType &attribute, TokenFacts &facts) {
   if (SamlAttributeIsGroupIdentity(attribute)) {
-    if (facts.groups.empty()) { // with room for each attribute in turn, all groups would be copied each time
+    if (facts.groups.empty()) { // reserving for each attribute would copy all groups each time
       facts.groups.reserve(attribute.values.size());
     }
     for (std::string &value : attribute.values) {
@@ -102,7 +102,7 @@ bool SamlAttributeIsSurName(const AttributeType &attribute) {
 
 PrincipalId ParseGroupIdentity(std::string value) {
   const std::size_t backslash = value.find('\\');
-  if (!PartsInTwo(value, backslash)) {
+  if (!HasBothSides(value, backslash)) {
     throw ParseException(
         MessageFormatter::ASPrint("Failed to parse Group Identity value: `%1'; domain or group missing", value));
   }
@@ -116,7 +116,7 @@ PrincipalId ParseSamlNameId(const NameIDType &nameId) {
     throw ParseException(MessageFormatter::ASPrint("Invalid or unsupported NameId format '%1'", nameId.Format));
   }
   const std::size_t atSign = nameId.value.rfind('@');
-  if (!PartsInTwo(nameId.value, atSign)) {
+  if (!HasBothSides(nameId.value, atSign)) {
     throw ParseException(MessageFormatter::ASPrint(
         "Failed to parse the UPN NameID: `%1'; name or domain part is missing.", nameId.value));
   }

@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// `TokenFacts`, what a token says, and the readers of its names, groups, delegates and attributes.
+/// `TokenFacts`, the content of a token, and the readers of its names, groups, delegates and attributes.
 
 #pragma once
 
@@ -21,7 +21,7 @@
 
 namespace SsoClient {
 
-/// What an assertion says, whether or not somebody vouches for it.
+/// The content of an assertion, verified or not.
 struct TokenFacts {
   std::string id;
   Tarvel::System::DateTime startDate;
@@ -39,22 +39,22 @@ struct TokenFacts {
   Tarvel::Ref<const Tarvel::Crypto::Certificate> confirmationCertificate; ///< null for bearer
 };
 
-/// The facts that `assertion` states; it is used up. Neither its dates nor its signature are judged here.
-/// @throws ParseException when a name, a group or the solution attribute is not of its form.
+/// The content of `assertion`, which is moved from. Neither its dates nor its signature are checked here.
+/// @throws ParseException when a name, a group or the solution attribute is malformed.
 TokenFacts TakeTokenFacts(SamlAssertionType &&assertion);
 
-/// Which of the attributes that mean something to the token this is, by its `Name`.
+/// Whether `attribute` is one of those that the token uses, by its `Name`.
 bool SamlAttributeIsGroupIdentity(const AttributeType &attribute);
 bool SamlAttributeIsSolution(const AttributeType &attribute);
 bool SamlAttributeIsGivenName(const AttributeType &attribute);
 bool SamlAttributeIsSurName(const AttributeType &attribute);
 
-/// The group written as `domain\name`; the first backslash parts them.
-/// @throws ParseException when one of them is missing.
+/// The group in the form `domain\name`. The first backslash is the separator.
+/// @throws ParseException when domain or name is missing.
 PrincipalId ParseGroupIdentity(std::string value);
 
-/// The principal written as `name@domain`; the last at-sign parts them.
-/// @throws ParseException when the format is not the user principal name, or one of them is missing.
+/// The principal in the form `name@domain`. The last at-sign is the separator.
+/// @throws ParseException when the format is not the user principal name, or name or domain is missing.
 PrincipalId ParseSamlNameId(const NameIDType &nameId);
 
 /// Whether the attribute's one value is "true", in any letter case.
@@ -64,7 +64,8 @@ bool ParseIsSolutionAttribute(const AttributeType &attribute);
 /// The attribute's first value; empty when it has none.
 std::string ParsePrincipalNameAttribute(const AttributeType &attribute);
 
-/// @throws ParseException as `ParseSamlNameId`.
+/// The delegate and the time of the delegation.
+/// @throws ParseException in the same cases as `ParseSamlNameId`.
 Delegate ParseToDelegate(const DelegateType &delegate);
 
 } // namespace SsoClient

@@ -31,7 +31,7 @@ Ref<Signature> ReadSignature(const ElementNode &root, const ElementNode &element
   return signature;
 }
 
-// An identifier names one element only: the platform refuses to verify a document in which a second element bears it.
+// An identifier refers to one element only: the platform does not verify a document in which a second element has it.
 bool CoversAssertion(const Signature &signature, std::string_view assertionId) {
   const std::vector<Signature::Reference> &references = signature.GetReferences();
   return std::any_of(references.begin(), references.end(), [&](const Signature::Reference &reference) {

@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// `ParseTokenSignature`, which finds a token's signature and makes sure that it covers the token.
+/// `ParseTokenSignature`, which reads the signature of a token and checks that it covers the token.
 
 #pragma once
 
@@ -12,9 +12,9 @@
 
 namespace SsoClient {
 
-/// Reads the signature that the cursor stands on, a child of `assertion`, and moves the cursor to the next node. Nothing is
-/// verified yet, but what it signs includes all of `assertion`.
-/// @throws ParseException when there is no element, it is no signature, or its references leave the assertion out.
+/// Reads the signature at the cursor, a child of `assertion`, and moves the cursor to the next node. The signature is not
+/// verified yet, but its references are known to include the whole of `assertion`.
+/// @throws ParseException when there is no element, when it is not a signature, and when no reference is to the assertion.
 void ParseTokenSignature(NodeFilterIterator &iterator, const Tarvel::Xml::ElementNode &assertion,
                          Tarvel::Ref<Tarvel::Xml::Security::Signature> &signature);
 

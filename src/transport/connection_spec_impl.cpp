@@ -23,10 +23,10 @@ using Tarvel::System::ScheduledItem;
 using Tarvel::System::Stream;
 using Tarvel::System::TcpClientSocket;
 
-/// What to do over a connected socket to have a TLS stream.
+/// What is needed to make a TLS stream over a connected socket.
 struct TlsLayer {
   std::string targetHost;
-  std::string endpoint; // under which the session is remembered
+  std::string endpoint; // the key under which the TLS session is kept
   Ref<SSLContext> context;
   std::string parameter;
 };
@@ -45,7 +45,7 @@ void StartHandshake(const TlsLayer &layer, const Ref<Stream> &socket,
   throw Tarvel::InvalidStateException("The connection to " + endpoint + " failed: " + text);
 }
 
-/// The same; whatever it throws is a `Tarvel::Exception` or `std::bad_alloc`.
+/// The same, but throws `Tarvel::Exception` and `std::bad_alloc` only.
 void StartHandshakeOrThrowOurs(const TlsLayer &layer, const Ref<Stream> &socket,
                                const ConnectionSpec::ConnectCompletion &completion) {
   try {
@@ -61,7 +61,7 @@ void StartHandshakeOrThrowOurs(const TlsLayer &layer, const Ref<Stream> &socket,
   }
 }
 
-/// On an I/O thread: an exception that got away would leave whoever waits for the completion without an answer.
+/// Runs on an I/O thread. An exception that leaves it would mean that the completion is never called.
 void OnSocketConnected(const TlsLayer &layer, const Ref<Stream> &socket, const Exception *failure,
                        const ConnectionSpec::ConnectCompletion &completion) {
   if (failure) {
@@ -102,7 +102,7 @@ bool SsoCustomConnectionSpecImpl::IsReuseOnAuthErrorSupported() const {
 
 Ref<ScheduledItem> SsoCustomConnectionSpecImpl::AsyncConnect(ConnectCompletion completion) const {
   const Ref<TcpClientSocket> socket = Tarvel::System::CreateTcpClientSocket();
-  // Made first: whatever throws here does so before the completion can be called.
+  // Made first, so that nothing can throw after the connection has been started.
   Ref<ScheduledItem> canceller = Tarvel::System::CreateStreamCanceller(socket);
   socket->AsyncConnect(
       GetConnectionTargetHost(), m_port,
@@ -148,15 +148,24 @@ Ref<ScheduledItem> SsoCustomSslConnectionSpecImpl::AsyncConnect(ConnectCompletio
   });
 }
 
+Ref<ConnectionSpec> CreateSsoConnectionSpec(const std::string &host, int port, bool useDomainControllerName) {
+  return Tarvel::MakeRef<SsoCustomConnectionSpecImpl>(host, port, useDomainControllerName);
+}
+
 void CreateSsoConnectionSpec(const std::string &host, int port, bool useDomainControllerName,
                              Ref<ConnectionSpec> &out) {
-  out = Tarvel::MakeRef<SsoCustomConnectionSpecImpl>(host, port, useDomainControllerName);
+  out = CreateSsoConnectionSpec(host, port, useDomainControllerName);
+}
+
+Ref<ConnectionSpec> CreateSsoSSLConnectionSpec(const std::string &host, int port, const Ref<SSLContext> &context,
+                                               const std::string &parameter, bool useDomainControllerName) {
+  const auto inner = Tarvel::MakeRef<SsoCustomConnectionSpecImpl>(host, port, useDomainControllerName);
+  return Tarvel::MakeRef<SsoCustomSslConnectionSpecImpl>(context, parameter, inner);
 }
 
 void CreateSsoSSLConnectionSpec(const std::string &host, int port, const Ref<SSLContext> &context,
                                 const std::string &parameter, bool useDomainControllerName, Ref<ConnectionSpec> &out) {
-  const auto inner = Tarvel::MakeRef<SsoCustomConnectionSpecImpl>(host, port, useDomainControllerName);
-  out = Tarvel::MakeRef<SsoCustomSslConnectionSpecImpl>(context, parameter, inner);
+  out = CreateSsoSSLConnectionSpec(host, port, context, parameter, useDomainControllerName);
 }
 
 std::string GetOstrelDCName() {

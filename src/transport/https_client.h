@@ -16,15 +16,16 @@
 
 namespace SsoClient {
 
-/// Posts to one address. Immutable; safe on any thread.
+/// Posts to one address. Immutable, so any number of threads may use it.
 class HttpsClient final : public Transport {
 public:
-  /// @param url the service's address. Plain http is accepted without complaint: its users decide.
-  /// @param context may be null for http; shared with the client. @param sslParameter and @param useDomainControllerName
-  ///        as in `CreateSsoSSLConnectionSpec`.
-  /// @param timeoutMicroseconds for each request of the sessions that waits, from the connect to the response's last byte.
-  /// @throws Tarvel::Http::MalformedURLException for a bad address, Tarvel::InvalidArgumentException for https without a
-  ///         context.
+  /// @param url the service's address. Plain http is accepted.
+  /// @param context may be null for http. The client keeps a reference.
+  /// @param sslParameter see `CreateSsoSSLConnectionSpec`
+  /// @param timeoutMicroseconds for each `SendRequest` of a session, from the connect to the last byte of the response
+  /// @param useDomainControllerName see `CreateSsoSSLConnectionSpec`
+  /// @throws Tarvel::Http::MalformedURLException for a malformed address.
+  /// @throws Tarvel::InvalidArgumentException for https without a context.
   HttpsClient(const std::string &url, const Tarvel::Ref<Tarvel::Ssl::SSLContext> &context,
               const std::string &sslParameter, std::int64_t timeoutMicroseconds, bool useDomainControllerName);
   HttpsClient(const std::string &url, const Tarvel::Ref<Tarvel::Ssl::SSLContext> &context,

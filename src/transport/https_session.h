@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// `HttpsSession`, one conversation over HTTP, and what becomes of an HTTP response.
+/// `HttpsSession`, one conversation over HTTP, and the translation of HTTP responses.
 
 #pragma once
 
@@ -18,8 +18,8 @@
 
 namespace SsoClient {
 
-/// Posts requests with a cookie store of its own: what the service sets in one leg of a negotiation comes back in the
-/// next, and in no other session.
+/// Posts requests with its own cookie store: a cookie that the service sets in one leg of a negotiation is sent in the next
+/// leg, and in no other session.
 class HttpsSession final : public TransportSession {
 public:
   HttpsSession(const Tarvel::Ref<Tarvel::Http::ConnectionSpec> &spec, const std::string &path,
@@ -27,11 +27,11 @@ public:
 
   void SendRequest(const Request &request, Tarvel::Ref<Tarvel::Reader> &response) override;
 
-  /// `completion` runs on an I/O thread, so it must not block. Nothing limits the time: cancel `item` for that.
+  /// `completion` runs on an I/O thread, so it must not block. There is no time-out: cancel `item` to stop the request.
   void SendRequestAsync(const Request &request, const Completion &completion,
                         Tarvel::Ref<Tarvel::System::ScheduledItem> &item) override;
 
-  /// The same; the other form hands the pending request out as its item.
+  /// The same, but sets `pending` to the request itself, which can be waited for.
   void SendRequestAsync(const Request &request, const Completion &completion,
                         Tarvel::Ref<Tarvel::Http::PendingRequestItem> &pending);
 
@@ -41,20 +41,20 @@ private:
   const std::int64_t m_timeoutMicroseconds;
 };
 
-/// Turns the outcome of an HTTP exchange into either an error or a body. 2xx and 500 have a body, the latter because SOAP
-/// 1.1 sends its faults so; any other status is an error.
-/// @param exception null when there is a response. @param error a `CommunicationException`; left alone when there is a
-/// body. @param body left alone when there is an error.
+/// Sets either `error` or `body` from the outcome of an HTTP exchange, and leaves the other unchanged. Status 2xx and 500 give
+/// a body: SOAP 1.1 sends faults with 500. Any other status is an error.
+/// @param exception the failure of the exchange; null when there is a response
+/// @param error set to a `CommunicationException`
 void TranslateResponse(const Tarvel::Exception *exception, const Tarvel::Ref<Tarvel::Http::ClientResponse> &response,
                        std::shared_ptr<const Tarvel::Exception> &error, Tarvel::Ref<Tarvel::Reader> &body);
 
-/// The completion function of an asynchronous request: calls back once, with the error or with the body, the other null.
-/// When memory runs out on the way, the error is a `Tarvel::OutOfMemoryException`.
+/// Calls `completion` once, with the error and null or with null and the body of the response. The error is a
+/// `Tarvel::OutOfMemoryException` when memory runs out here. `pending` is not used: the user agent's completions have it.
 void AsyncTranslateResponse(const TransportSession::Completion &completion, const Tarvel::Exception *exception,
                             const Tarvel::Ref<Tarvel::Http::ClientResponse> &response,
                             const Tarvel::Ref<Tarvel::Http::PendingRequestItem> &pending);
 
-/// The completion of a request whose outcome is waited for.
+/// Does nothing: the completion of a request that is waited for.
 void noop(const Tarvel::Exception *exception, Tarvel::Reader *response);
 
 } // namespace SsoClient

@@ -1,6 +1,8 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// `Transport` and `TransportSession`, the service's view of what carries its requests.
+/// `Transport` and `TransportSession`, which send requests to the service.
+///
+/// They are interfaces so that tests can replace the network. The product has one implementation of each.
 
 #pragma once
 
@@ -19,20 +21,20 @@ class ScheduledItem;
 
 namespace SsoClient {
 
-/// One conversation with the service: the legs of a negotiation share one, any other request has its own. For one
-/// operation at a time.
+/// One conversation with the service. All legs of a negotiation are sent in one session; every other request has its own. A
+/// session is for one operation at a time.
 class TransportSession {
 public:
-  /// Called once: with null and a reader over the response body, or with the failure and null. Both pointers are good
-  /// during the call.
+  /// Called once: with null and a reader over the response body, or with the failure and null. Both pointers are valid
+  /// during the call only.
   using Completion = std::function<void(const Tarvel::Exception *failure, Tarvel::Reader *response)>;
 
-  /// Posts the request and waits for the whole response. `response` stays readable after the session is gone.
+  /// Posts the request and waits for the whole response. `response` can still be read after the session is destroyed.
   /// @throws CommunicationException when the transport fails.
   virtual void SendRequest(const Request &request, Tarvel::Ref<Tarvel::Reader> &response) = 0;
 
-  /// Posts the request without waiting; `item` is the work that is under way. `completion` runs on an I/O
-  /// thread, where it must not block, nor wait for another request.
+  /// Posts the request without waiting; `item` cancels it. `completion` runs on an I/O thread, where it must neither block nor
+  /// wait for another request. The product calls only `SendRequest`; this is part of the interface all the same.
   virtual void SendRequestAsync(const Request &request, const Completion &completion,
                                 Tarvel::Ref<Tarvel::System::ScheduledItem> &item) = 0;
 
@@ -46,7 +48,7 @@ protected:
 /// Opens conversations with one service. Safe on any thread.
 class Transport {
 public:
-  /// A new session, which the caller shares with nobody.
+  /// A new session, of which the caller has the only reference.
   virtual std::shared_ptr<TransportSession> CreateSession() const = 0;
 
 protected:

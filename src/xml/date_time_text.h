@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// The date-times that requests carry: their value and their text.
+/// The date-times in requests: their value and their text.
 
 #pragma once
 
@@ -10,10 +10,10 @@
 
 namespace SsoClient {
 
-/// `date`, in UTC, `minutes` later, or earlier when negative; more than 35 minutes either way wrap.
+/// `date` plus `minutes`, which may be negative, in UTC. The offset wraps beyond 35 minutes in either direction.
 Tarvel::System::DateTime AddMinutesToDate(const Tarvel::System::DateTime &date, int minutes);
 
-/// `date` in the form xsd:dateTime with three fraction digits and its zone, as 2013-05-07T09:03:01.042Z.
+/// `date` in the form xsd:dateTime with three fraction digits and its zone, for example 2013-05-07T09:03:01.042Z.
 std::string DateTimeFormatter(const Tarvel::System::DateTime &date);
 
 } // namespace SsoClient

@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// `NodeFilterIterator`, the cursor with which every parser walks a tree, and the filter that hides what means nothing.
+/// `NodeFilterIterator`, the cursor that all token parsers use, and its filter, which hides comments and white space.
 
 #pragma once
 
@@ -10,8 +10,10 @@
 
 namespace SsoClient {
 
-/// Decides on which nodes a cursor may stop. Immutable; safe on any thread. Held by a shared pointer that is made from
-/// the concrete type, or that owns nothing when the filter outlives the cursors.
+/// Decides at which nodes a cursor stops. Immutable, so any number of threads may use it. Held by a shared pointer that is
+/// made from the concrete type, or that owns nothing when the filter outlives the cursors.
+///
+/// The library has one filter and needs no second. The interface is kept because it is part of the established form of cursors.
 class NodeFilter {
 public:
   virtual bool Accept(const Tarvel::Xml::Node &node) const = 0;
@@ -23,33 +25,33 @@ protected:
   ~NodeFilter() = default;
 };
 
-/// Hides comments, and text of nothing but XML white space. Everything else is shown: an unknown kind of node must not
-/// slip past the strict checks.
+/// Hides comments, and texts that consist of XML white space. All other nodes are visible: an unknown kind of node must reach
+/// the strict checks.
 class SkipWsAndCommentsFilter final : public NodeFilter {
 public:
   bool Accept(const Tarvel::Xml::Node &node) const override;
 };
 
-/// A place among the children of an element. A copy moves on its own. The tree must outlive the cursor.
+/// A position among the children of an element. Copies move independently. The tree must outlive the cursor.
 class NodeFilterIterator {
 public:
-  /// Stands on `node`, whatever the filter says about it.
+  /// Starts at `node`, even if the filter hides it.
   NodeFilterIterator(const Tarvel::Xml::Node *node, std::shared_ptr<const NodeFilter> filter);
 
-  /// Moves to the next accepted sibling, or off the end; a cursor that is off the end stays there.
+  /// Moves to the next visible sibling, or past the end. A cursor past the end stays there.
   NodeFilterIterator &MoveToSibling();
 
-  /// Moves to the first accepted child, or off the end.
+  /// Moves to the first visible child, or past the end.
   NodeFilterIterator &MoveToChild();
 
-  /// A cursor on the first accepted child.
+  /// A cursor at the first visible child.
   NodeFilterIterator GetChild() const;
 
-  const Tarvel::Xml::Node *node; ///< where the cursor stands; null off the end
+  const Tarvel::Xml::Node *node; ///< the node at the cursor; null past the end
   std::shared_ptr<const NodeFilter> filter;
 };
 
-/// The element that the cursor stands on; null off the end and on a node of another kind.
+/// The element at the cursor; null past the end and at a node of another kind.
 const Tarvel::Xml::ElementNode *IteratorToElement(const NodeFilterIterator &iterator) noexcept;
 
 } // namespace SsoClient

@@ -2,8 +2,6 @@
 
 #include "xml/qualified_name.h"
 
-#include "model/namespaces.h"
-
 #include <ssoclient/exceptions.h>
 #include <tarvel/core/message_formatter.h>
 
@@ -35,7 +33,7 @@ QNameView ResolveQName(const ElementNode &element, std::string_view text, std::s
   const std::string_view prefix = text.substr(0, colon);
   std::string_view namespaceUri;
   if (!element.LookupNamespace(prefix, namespaceUri)) {
-    // The missing blank and the unlike quotes belong to the message's established form.
+    // The missing blank and the two different quotes are part of the established form of the message.
     throw ParseException(Tarvel::MessageFormatter::ASPrint("Element %1at %2,%3 uses undefined prefix: `%4'",
                                                            element.GetName(), element.GetLine(), element.GetColumn(),
                                                            prefix));

@@ -1,8 +1,10 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// Qualified names: of elements, and written as text in attributes.
+/// Qualified names: the names of elements, and names in the text of attributes.
 
 #pragma once
+
+#include "model/namespaces.h"
 
 #include <tarvel/xml/node.h>
 #include <tarvel/xml/qname.h>
@@ -26,32 +28,35 @@ struct QNameView {
   std::string ToString() const;
 };
 
-/// The name `name` in no namespace, as attributes without a prefix have it.
+/// `name` in no namespace: the name of an attribute without a prefix.
 constexpr QNameView LocalName(std::string_view name) noexcept {
   return {std::string_view(), name};
 }
 
-/// Reads a name that is written with or without prefix, by the namespace declarations in scope at `element`; the first
-/// colon ends the prefix. Without a colon the name is in `defaultNamespace`.
+/// The name of the attribute that says of which type an element is.
+constexpr QNameView XSI_TYPE(Namespaces::XSI, "type");
+
+/// Reads a name with or without prefix. Prefixes are resolved by the namespace declarations in scope at `element`; the
+/// first colon ends the prefix. A name without a colon is in `defaultNamespace`.
 /// @return a view into `text`, into the tree and into `defaultNamespace`.
 /// @throws ParseException when the prefix is not bound.
 QNameView ResolveQName(const Tarvel::Xml::ElementNode &element, std::string_view text,
                        std::string_view defaultNamespace);
 
-/// The same as a name that owns its texts.
-/// @param name written on success only.
+/// The same, but the result owns its texts.
+/// @param name set on success only.
 void ResolveQName(const Tarvel::Xml::ElementNode &element, std::string_view text, std::string_view defaultNamespace,
                   Tarvel::Xml::QName &name);
 
-/// Whether `element` is there, has that local name, and its prefix is bound to that namespace.
+/// Whether `element` is not null, has that local name, and has a prefix that is bound to that namespace.
 bool ElementQNameIs(const Tarvel::Xml::ElementNode *element, std::string_view localName,
                     std::string_view namespaceUri) noexcept;
 
-/// Whether `element` has an `xsi:type` that names `type`; without a prefix it names a type of the default namespace.
+/// Whether `element` has an `xsi:type` whose value is `type`. A value without a prefix is in the default namespace.
 /// @throws ParseException when the type's prefix is not bound.
 bool ElementXsiTypeIs(const Tarvel::Xml::ElementNode &element, const QNameView &type);
 
-/// Reads `text`, the value of an `xsi:type` of `element`, as a name; without a prefix it is of the default namespace.
+/// Reads `text`, the value of an `xsi:type` of `element`, as a name. A name without a prefix is in the default namespace.
 /// @return a view into `text` and into the tree.
 /// @throws ParseException when the prefix is not bound.
 QNameView ResolveXsiType(const Tarvel::Xml::ElementNode &element, std::string_view text);

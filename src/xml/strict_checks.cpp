@@ -28,7 +28,7 @@ template <typename... Args>
 }
 
 [[noreturn]] void RefuseMissingAttribute(const ElementNode &element, std::string_view name) {
-  // There is no apostrophe after the element's name: the message's established form.
+  // The missing apostrophe after the name of the element is part of the established form of the message.
   Refuse("Node '%1 is missing required attribute '%2'", element.GetName(), name);
 }
 
@@ -86,7 +86,7 @@ void RequireNoAttributes(const ElementNode &element) {
 
 void RequireElementAttributesNames(const ElementNode &element, std::initializer_list<std::string_view> required,
                                    std::initializer_list<std::string_view> optional) {
-  // An element has few known names: a scan for each of them costs less than a set, and stays linear in the attributes.
+  // There are few known names, so a scan for each of them is faster than a set, and linear in the number of attributes.
   for (const std::string_view name : required) {
     if (!HasAttributeWritten(element, name)) {
       RefuseMissingAttribute(element, name);
@@ -158,7 +158,7 @@ void GetULongOptionalAttribute(const ElementNode &element, std::string_view name
   }
   const std::string_view text = attribute->GetValue();
   std::uint64_t value = 0;
-  // Signs and digit grouping are refused first: the conversion alone would take "-1" for a number near 2^64.
+  // Signs and digit grouping are refused first: the conversion alone would read "-1" as a number near 2^64.
   if (text.find_first_not_of(DIGITS) != std::string_view::npos ||
       !boost::conversion::try_lexical_convert(text.data(), text.size(), value)) {
     Refuse("%1/@%2 is not a non-negative integer.", element.GetName(), name);

@@ -1,9 +1,9 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// The checks with which the assertion parser refuses whatever it does not know.
+/// The checks with which the assertion parser refuses all that it does not know.
 ///
-/// Each returns normally or throws a `ParseException` that names the element, and then has changed nothing. They see
-/// elements through the cursor: comments and white space between nodes do not count.
+/// Each throws a `ParseException` that contains the name of the element, and then has changed nothing. Checks of content use
+/// the cursor, so they ignore comments, and white space between nodes.
 
 #pragma once
 
@@ -22,34 +22,34 @@
 
 namespace SsoClient {
 
-/// `element` must be there and have that name. Returns it.
+/// `element` must have that name and not be null. Returns it.
 const Tarvel::Xml::ElementNode &RequireElementQName(const Tarvel::Xml::ElementNode *element, std::string_view localName,
                                                     std::string_view namespaceUri);
 
-/// The element that the cursor stands on must have no content.
+/// The element at the cursor must have no content.
 void RequireEmptyElement(NodeFilterIterator iterator);
 
-/// The cursor must be off the end; `message` says what is refused otherwise.
+/// The cursor must be past the end. Otherwise the exception has the text `message`.
 void RequireNoFurtherNode(const NodeFilterIterator &iterator, const char *message);
 
 /// `element` must have no attributes but namespace declarations.
 void RequireNoAttributes(const Tarvel::Xml::ElementNode &element);
 
-/// `element` must have all the required attributes, may have the optional ones, and no others but namespace
-/// declarations. The names are compared as they are written.
+/// `element` must have all required attributes and may have the optional ones and namespace declarations, but no others. The
+/// names are compared as they are written.
 void RequireElementAttributesNames(const Tarvel::Xml::ElementNode &element,
                                    std::initializer_list<std::string_view> required,
                                    std::initializer_list<std::string_view> optional);
 
-/// The same for attributes that are told apart by qualified name.
+/// The same, but attributes are compared by qualified name.
 void RequireElementAttributesQNames(const Tarvel::Xml::ElementNode &element, std::initializer_list<QNameView> required,
                                     std::initializer_list<QNameView> optional);
 
-/// The element that the cursor stands on must hold one text and nothing else. Two texts with a comment between them are
-/// two: a comment cannot cut a value short. It can only cut off white space at either end, which alone is no text here.
+/// The element at the cursor must contain one text and nothing else. Two texts with a comment between them are refused, so
+/// that a comment cannot cut off a part of a value. It can only cut off white space at either end, which is not a text here.
 void RequireTextualContent(NodeFilterIterator iterator, std::string &text);
 
-/// The value of an attribute without a prefix; empty when it is not there.
+/// The value of an attribute without a prefix; empty when there is no such attribute.
 std::string_view GetTextAttribute(const Tarvel::Xml::ElementNode &element, std::string_view name) noexcept;
 
 /// Reads an attribute in the form xsd:dateTime.
@@ -58,7 +58,7 @@ void GetDateAttribute(const Tarvel::Xml::ElementNode &element, std::string_view 
 /// Reads an attribute that is "1", "true", "0" or "false", in any letter case.
 void GetBoolAttribute(const Tarvel::Xml::ElementNode &element, std::string_view name, bool &flag);
 
-/// Reads an attribute of decimal digits; leaves `number` empty when it is not there.
+/// Reads an attribute that consists of decimal digits. `number` is empty when there is no such attribute.
 void GetULongOptionalAttribute(const Tarvel::Xml::ElementNode &element, std::string_view name,
                                boost::optional<std::uint64_t> &number);
 

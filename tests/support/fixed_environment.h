@@ -4,7 +4,7 @@
 
 #pragma once
 
-#include <tarvel/system/environment.h>
+#include <tarvel/core/environment.h>
 
 #include <cstdint>
 #include <memory>
@@ -22,13 +22,13 @@ public:
   FixedEnvironment() : m_scope(Make()) {}
 
 private:
-  static Tarvel::System::Environment Make() {
+  static Tarvel::Environment Make() {
     const auto count = std::make_shared<int>(0);
     return {[] { return FIXED_NOW; },
             [count] { return "00000000-0000-4000-8000-00000000000" + std::to_string(++*count); }};
   }
 
-  Tarvel::System::ScopedEnvironment m_scope;
+  Tarvel::ScopedEnvironment m_scope;
 };
 
 } // namespace Testing

@@ -5,7 +5,7 @@
 #pragma once
 
 #include "xml/node_filter_iterator.h"
-#include "xml/parse_xml.h"
+#include "xml/xml_text.h"
 
 #include <tarvel/xml/document.h>
 

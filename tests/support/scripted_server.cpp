@@ -104,7 +104,7 @@ ServerConnection::~ServerConnection() {
   SSL_free(m_tls);
 }
 
-bool ServerConnection::ShakeHands() {
+bool ServerConnection::Handshake() {
   if (!m_tls) {
     return true;
   }

@@ -48,7 +48,7 @@ public:
 
   /// Performs the handshake if the server has TLS; whether it succeeded. A script calls this first, unless it disturbs
   /// the handshake.
-  bool ShakeHands();
+  bool Handshake();
 
   /// At most `limit` bytes; empty when the peer has ended the connection in any way.
   std::string ReadSome(std::size_t limit = 65536);

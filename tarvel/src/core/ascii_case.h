@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// Comparison of the texts that protocols are written in, where letter case has no meaning.
+/// Comparison of protocol texts in which letter case has no meaning.
 
 #pragma once
 
@@ -8,7 +8,7 @@
 
 namespace Tarvel {
 
-/// Whether both are equal, letter case of ASCII letters aside.
+/// Whether both are equal, ignoring the case of ASCII letters.
 bool EqualsIgnoringCase(std::string_view left, std::string_view right) noexcept;
 
 } // namespace Tarvel

@@ -12,7 +12,7 @@ namespace {
 constexpr std::string_view ALPHABET = "ABCDEFGHIJKLMNOPQRSTUVWXYZabcdefghijklmnopqrstuvwxyz0123456789+/";
 constexpr char PAD = '=';
 
-/// What a character stands for: its six bits, or one of these. Both have a bit that no six bits have.
+/// What a character means: its six bits, or one of these. Both have a bit set that no six-bit value has.
 constexpr std::uint8_t OTHER = 0x80;
 constexpr std::uint8_t BLANK = 0x40;
 
@@ -40,7 +40,7 @@ std::uint32_t ValueOf(char c) noexcept {
   throw Base64FormatException("Base64 text: " + std::string(reason) + " at character " + std::to_string(position + 1));
 }
 
-/// Decodes groups of four characters as long as they hold nothing but alphabet; returns the characters used.
+/// Decodes groups of four characters of the alphabet, up to the first other character; returns the number of characters used.
 std::size_t DecodeFullGroups(std::string_view text, std::uint8_t *&out) noexcept {
   std::size_t used = 0;
   while (text.size() - used >= 4) {
@@ -59,7 +59,8 @@ std::size_t DecodeFullGroups(std::string_view text, std::uint8_t *&out) noexcept
   return used;
 }
 
-/// Checks the text from its first pad on: as many pads as complete a group of `characters`, blanks apart, and the end.
+/// Checks the text from its first pad on: exactly as many pads as a last group of `characters` needs, with blanks allowed
+/// between and after them, and nothing else.
 void RequirePadding(std::string_view text, std::size_t position, int characters) {
   if (characters < 2) {
     Refuse("misplaced padding", position);
@@ -131,7 +132,7 @@ std::vector<std::uint8_t> StringUtil::Base64Decode(std::string_view text) {
   std::vector<std::uint8_t> bytes(text.size() / 4 * 3);
   std::uint8_t *out = bytes.data();
   std::uint32_t bits = 0;
-  int characters = 0; // of a group that blanks or the padding divide
+  int characters = 0; // read so far of a group that blanks or the padding interrupt
   std::size_t position = 0;
   while (position < text.size()) {
     if (characters == 0) {

@@ -8,7 +8,7 @@
 
 namespace Tarvel {
 
-/// The type that `name`, as `std::type_info::name` gives it, stands for; `name` itself when it is no such name.
+/// The type whose `std::type_info::name` is `name`; `name` itself when it is not a type's name.
 std::string Demangle(const char *name);
 
 } // namespace Tarvel

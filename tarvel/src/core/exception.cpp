@@ -18,7 +18,7 @@ namespace Tarvel {
 
 namespace {
 
-/// Frames kept of a call stack: an exception is made far more often than its stack is looked at.
+/// The most frames that are kept of a call stack: an exception is made far more often than its stack is read.
 constexpr std::size_t MAX_FRAMES = 32;
 
 using Address = boost::stacktrace::frame::native_frame_ptr_t;
@@ -41,11 +41,11 @@ bool IsExceptionConstructor(std::string_view function) {
 
 struct Exception::State {
   State(const std::string &text, Address caller) : message(text) {
-    // Only addresses are taken here; names are looked up when somebody asks for them.
+    // Only addresses are recorded here; names are looked up when they are asked for.
     const std::size_t written = boost::stacktrace::safe_dump_to(frames.data(), sizeof frames);
     const auto end = std::find(frames.begin(), frames.begin() + static_cast<std::ptrdiff_t>(written), nullptr);
     const auto first = std::find(frames.begin(), end, caller);
-    // Everything inside of the constructor's caller is the machinery that took the stack.
+    // Frames further in than the constructor's caller belong to the code that records the stack.
     begin = first == end ? 0 : static_cast<std::size_t>(first - frames.begin());
     count = static_cast<std::size_t>(end - frames.begin()) - begin;
   }
@@ -58,7 +58,7 @@ struct Exception::State {
   std::size_t count = 0;
 };
 
-// Never inlined, so that its return address is where the exception, or the part of it that derives from this, was made.
+// Never inlined: its return address is where the exception was made, or in the constructor of the class that derives from it.
 __attribute__((noinline)) Exception::Exception(const std::string &message)
     : m_state(std::make_shared<const State>(message, __builtin_return_address(0))) {}
 
@@ -96,6 +96,10 @@ std::string Exception::Where() const {
 
 Exception *Exception::Clone() const {
   return new Exception(*this);
+}
+
+std::unique_ptr<Exception> Exception::Copy() const {
+  return std::unique_ptr<Exception>(Clone());
 }
 
 void Exception::Throw() const {

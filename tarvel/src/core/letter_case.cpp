@@ -3,7 +3,7 @@
 #include <tarvel/core/string_util.h>
 
 #include "core/ascii_case.h"
-#include "system/fork_gate.h"
+#include "core/fork_gate.h"
 
 #include <algorithm>
 #include <clocale>
@@ -19,10 +19,10 @@ using WideMapping = wint_t (*)(wint_t, locale_t);
 
 constexpr wint_t LAST_CODE_POINT = 0x10FFFF;
 
-/// The Unicode locale that the C library carries, whatever locale the host process has chosen. Null when this system
-/// does not have it. It is kept until the process ends.
+/// The Unicode locale of the C library, whatever locale the host process has chosen. Null when this system does not have
+/// it. It is kept until the process ends.
 locale_t UnicodeLocale() {
-  const System::Computation computing; // the C library has a lock of its own
+  const Computation computing; // the C library takes a lock
   static std::once_flag once;
   static locale_t locale = nullptr;
   std::call_once(once, [] { locale = ::newlocale(LC_CTYPE_MASK, "C.UTF-8", nullptr); });

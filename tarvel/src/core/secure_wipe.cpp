@@ -8,7 +8,7 @@ namespace Tarvel {
 
 namespace {
 
-/// Growing to the capacity never allocates, and makes all of the memory part of the value.
+/// Growing to the capacity does not allocate, and makes all of the memory part of the value.
 template <typename Container>
 void WipeAll(Container &container) noexcept {
   container.resize(container.capacity());

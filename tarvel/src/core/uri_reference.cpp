@@ -53,7 +53,7 @@ bool Is(char c, std::uint8_t bit) noexcept {
   return (CLASSES[static_cast<unsigned char>(c)] & bit) != 0;
 }
 
-/// How many characters at the start of `text` are of the class.
+/// The number of characters at the start of `text` that are in the class.
 std::size_t CountWhile(std::string_view text, std::uint8_t bit) noexcept {
   const auto *const end = std::find_if_not(text.begin(), text.end(), [bit](char c) { return Is(c, bit); });
   return static_cast<std::size_t>(end - text.begin());
@@ -63,7 +63,7 @@ bool ConsistsOf(std::string_view text, std::uint8_t bit) noexcept {
   return CountWhile(text, bit) == text.size();
 }
 
-/// Whether all of `text` is of the class or escaped.
+/// Whether each character of `text` is in the class or escaped.
 bool ConsistsOfEscapedOr(std::string_view text, std::uint8_t bit) noexcept {
   constexpr std::size_t ESCAPE_LENGTH = 3;
   for (text.remove_prefix(CountWhile(text, bit)); !text.empty(); text.remove_prefix(CountWhile(text, bit))) {
@@ -79,7 +79,7 @@ bool StartsWith(std::string_view text, std::string_view beginning) noexcept {
   return text.substr(0, beginning.size()) == beginning;
 }
 
-/// Removes from `text` what is before the first of `stops`, or all of it. @return what was removed.
+/// Removes from `text` everything before the first of `stops`, or all of it. @return what was removed.
 std::string_view Take(std::string_view &text, std::string_view stops) noexcept {
   const auto end = std::find_first_of(text.begin(), text.end(), stops.begin(), stops.end());
   const std::string_view taken = text.substr(0, static_cast<std::size_t>(end - text.begin()));
@@ -96,7 +96,7 @@ std::optional<std::string_view> FindScheme(std::string_view text) noexcept {
   return text.substr(0, length);
 }
 
-/// @return whether `authority` is one.
+/// Sets the parts of `authority`. @return whether it is valid, an IP literal aside.
 bool SplitAuthority(std::string_view authority, UriReference &parts) noexcept {
   if (const std::size_t at = authority.find('@'); at != NPOS) {
     parts.userInformation = authority.substr(0, at);
@@ -117,8 +117,8 @@ bool SplitAuthority(std::string_view authority, UriReference &parts) noexcept {
          ConsistsOfEscapedOr(parts.userInformation.value_or(""), USER);
 }
 
-/// Whether the path is one. Without a scheme its first part has no ":", which would end a scheme; after an authority that
-/// part is empty.
+/// Whether the path is valid. Without a scheme its first segment has no ":", which would end a scheme; after an authority
+/// that segment is empty.
 bool IsPath(const UriReference &parts) noexcept {
   const std::string_view first = parts.path.substr(0, parts.path.find('/'));
   return ConsistsOfEscapedOr(parts.path, PATH) && (parts.scheme || first.find(':') == NPOS);
@@ -134,7 +134,7 @@ bool IsIPv6Address(std::string_view text) noexcept {
   return inet_pton(AF_INET6, copy.data(), &address) == 1;
 }
 
-/// "v", hexadecimal digits, "." and what a later standard says.
+/// "v", hexadecimal digits, "." and an address in a form that a later standard defines.
 bool IsLaterAddress(std::string_view text) noexcept {
   if (text.empty() || (text.front() != 'v' && text.front() != 'V')) {
     return false;

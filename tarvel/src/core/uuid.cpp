@@ -3,7 +3,7 @@
 #include <tarvel/core/exception.h>
 #include <tarvel/core/string_util.h>
 
-#include "system/current_environment.h"
+#include "core/current_environment.h"
 
 #include <boost/uuid/entropy_error.hpp>
 #include <boost/uuid/random_generator.hpp>
@@ -12,7 +12,7 @@
 namespace Tarvel {
 
 std::string StringUtil::GenerateUuid() {
-  const System::Environment *const environment = System::CurrentEnvironment();
+  const Environment *const environment = CurrentEnvironment();
   if (environment && environment->uuid) {
     return environment->uuid();
   }

@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// `AppendWiping`, for a text that is secret and grows.
+/// `AppendWiping`, which appends to a secret text.
 
 #pragma once
 
@@ -9,7 +9,7 @@
 
 namespace Tarvel {
 
-/// Appends `bytes`, which are not part of `text`. Memory that the text outgrows is overwritten before it is freed.
+/// Appends `bytes`, which must not be part of `text`. Memory that the text outgrows is overwritten before it is freed.
 void AppendWiping(std::string &text, std::string_view bytes);
 
 } // namespace Tarvel

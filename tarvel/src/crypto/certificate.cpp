@@ -19,13 +19,13 @@ Ref<const Certificate> DecodeBlock(PemBlock &block) {
   return CreateCertificateFromDer(block.GetData(), static_cast<std::size_t>(block.GetLength()));
 }
 
-[[noreturn]] void ThrowHoldsKey(std::string_view form) {
+[[noreturn]] void RefusePrivateKey(std::string_view form) {
   throw CryptoException("Holds a private key (" + std::string(form) + ") where only certificates belong");
 }
 
 bool IsPrivateKeyInDer(std::string_view bytes) {
-  const OpenSslUse use;
-  use.Require();
+  const OpenSslGuard guard;
+  guard.Require();
   const OpenSslErrorScope errors;
   const auto *position = reinterpret_cast<const unsigned char *>(bytes.data());
   const long length = static_cast<long>(bytes.size());
@@ -41,7 +41,7 @@ Ref<const Certificate> DecodeDerFile(std::string_view bytes) {
     return CreateCertificateFromDer(reinterpret_cast<const std::uint8_t *>(bytes.data()), bytes.size());
   } catch (const CryptoException &) {
     if (IsPrivateKeyInDer(bytes)) {
-      ThrowHoldsKey("DER");
+      RefusePrivateKey("DER");
     }
     throw;
   }
@@ -74,7 +74,7 @@ CertificateList CreateCertificatesFromPem(std::string_view pem) {
   PemBlock block;
   while (reader.Next(block)) {
     if (block.IsPrivateKey()) {
-      ThrowHoldsKey(block.GetLabel());
+      RefusePrivateKey(block.GetLabel());
     }
     if (block.IsCertificate()) {
       certificates.push_back(DecodeBlock(block));
@@ -88,9 +88,9 @@ CertificateList CreateCertificatesFromPem(std::string_view pem) {
 
 CertificateList LoadCertificates(const std::string &path) {
   constexpr char DER_SEQUENCE = 0x30;
-  const KeyFileText file(path);
+  const SecretText file = ReadKeyFile(path);
   const std::string_view text = file.Get();
-  return NamingPath(path, [text]() -> CertificateList {
+  return WithPathInErrors(path, [text]() -> CertificateList {
     if (text.starts_with(DER_SEQUENCE) && !PemReader::LooksLikePem(text)) {
       return {DecodeDerFile(text)};
     }

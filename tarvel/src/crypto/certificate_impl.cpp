@@ -4,7 +4,7 @@
 
 #include "crypto/library_context.h"
 #include "crypto/openssl_errors.h"
-#include "crypto/openssl_use.h"
+#include "crypto/openssl_guard.h"
 
 #include <tarvel/core/ref.h>
 
@@ -26,9 +26,9 @@ namespace {
 constexpr std::size_t MAX_CURVE_NAME_BYTES = 80;
 
 CertificateHandle Decode(const std::vector<std::uint8_t> &der) {
-  OpenSslUse::Prepare();
-  const OpenSslUse use;
-  use.Require();
+  OpenSslGuard::Prepare();
+  const OpenSslGuard guard;
+  guard.Require();
   const OpenSslErrorScope errors;
   if (der.empty() || der.size() > static_cast<std::size_t>(std::numeric_limits<long>::max())) {
     throw CryptoException("Certificate of " + std::to_string(der.size()) + " bytes does not decode");
@@ -38,11 +38,11 @@ CertificateHandle Decode(const std::vector<std::uint8_t> &der) {
   if (!blank) {
     throw OutOfMemoryException();
   }
-  CertificateHandle native(d2i_X509(&blank, &position, static_cast<long>(der.size()))); // frees it when it fails
+  CertificateHandle native(d2i_X509(&blank, &position, static_cast<long>(der.size()))); // frees `blank` on failure
   if (!native) {
     errors.Throw("Certificate does not decode");
   }
-  // Without a key, or without its size, it is of an algorithm that OpenSSL does not know; but it keeps silent about memory.
+  // No key, or a key without a size, means an algorithm that OpenSSL does not know, or a lack of memory.
   EVP_PKEY *const key = X509_get0_pubkey(native.get());
   if (!key || EVP_PKEY_get_bits(key) <= 0) {
     errors.RequireMemory();
@@ -54,11 +54,10 @@ CertificateHandle Decode(const std::vector<std::uint8_t> &der) {
   return native;
 }
 
-// OpenSSL reads BER too. Two encodings of one certificate would be two different certificates to whoever compares
-// bytes.
+// OpenSSL also reads BER. To code that compares bytes, two encodings of one certificate would be two certificates.
 void RequireCanonical(X509 *native, const std::vector<std::uint8_t> &der) {
   const OpenSslErrorScope errors;
-  i2d_re_X509_tbs(native, nullptr); // makes the next line encode anew, instead of giving the bytes that were read
+  i2d_re_X509_tbs(native, nullptr); // makes the next line encode again instead of returning the bytes that were read
   unsigned char *encoded = nullptr;
   const int length = i2d_X509(native, &encoded);
   const MemoryHandle owner(encoded);
@@ -110,7 +109,7 @@ KeyKind FindKeyKind(EVP_PKEY *key) {
   return EVP_PKEY_is_a(key, "EC") ? FindCurve(key) : KeyKind::OTHER;
 }
 
-// With an exponent of 1 everybody can sign, and an even one belongs to no private key (RFC 8017, section 3.1).
+// With an exponent of 1 anyone can sign, and no private key has an even one (RFC 8017, section 3.1).
 bool IsExponentSound(EVP_PKEY *key) {
   const OpenSslErrorScope errors;
   BIGNUM *read = nullptr;
@@ -122,7 +121,7 @@ bool IsExponentSound(EVP_PKEY *key) {
   return BN_is_odd(exponent.get()) && !BN_is_one(exponent.get()) && !BN_is_negative(exponent.get());
 }
 
-std::string TakeBioText(BIO *bio) {
+std::string CopyBioText(BIO *bio) {
   char *text = nullptr;
   const long length = BIO_get_mem_data(bio, &text);
   return length > 0 ? std::string(text, static_cast<std::size_t>(length)) : std::string();
@@ -137,24 +136,24 @@ BioHandle NewMemoryBio() {
 }
 
 std::string DescribeName(const X509_NAME *name) {
-  // RFC 2253 allows UTF-8 as it is; OpenSSL's flags would have every byte of it escaped.
+  // RFC 2253 allows UTF-8; OpenSSL's own flags for it would escape every byte beyond ASCII.
   constexpr unsigned long FLAGS = XN_FLAG_RFC2253 & ~static_cast<unsigned long>(ASN1_STRFLGS_ESC_MSB);
-  const OpenSslUse use;
-  use.Require();
+  const OpenSslGuard guard;
+  guard.Require();
   const OpenSslErrorScope errors;
   const BioHandle bio = NewMemoryBio();
   if (X509_NAME_print_ex(bio.get(), name, 0, FLAGS) < 0) {
     errors.Throw("Distinguished name cannot be written");
   }
-  return TakeBioText(bio.get());
+  return CopyBioText(bio.get());
 }
 
 } // namespace
 
 CertificateImpl::CertificateImpl(const std::uint8_t *data, std::size_t length)
     : m_der(data, data + length), m_native(Decode(m_der)) {
-  const OpenSslUse use;
-  use.Require();
+  const OpenSslGuard guard;
+  guard.Require();
   RequireCanonical(m_native.get(), m_der);
   m_notBefore = ToUtcMicroseconds(X509_get0_notBefore(m_native.get()));
   m_notAfter = ToUtcMicroseconds(X509_get0_notAfter(m_native.get()));
@@ -192,14 +191,14 @@ std::string CertificateImpl::GetSha256Thumbprint() const {
 }
 
 std::string CertificateImpl::ToPem() const {
-  const OpenSslUse use;
-  use.Require();
+  const OpenSslGuard guard;
+  guard.Require();
   const OpenSslErrorScope errors;
   const BioHandle bio = NewMemoryBio();
   if (PEM_write_bio_X509(bio.get(), m_native.get()) != 1) {
     errors.Throw("Certificate cannot be written as PEM");
   }
-  return TakeBioText(bio.get());
+  return CopyBioText(bio.get());
 }
 
 const CertificateImpl &AsImpl(const Certificate &certificate) {

@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// The one implementation of `Certificate`, over OpenSSL's.
+/// The only implementation of `Certificate`, based on OpenSSL's.
 
 #pragma once
 
@@ -49,8 +49,8 @@ private:
   mutable KeyContexts m_verifyContexts;
 };
 
-/// `certificate` as what it is.
-/// @throws TypeMismatchException when it is a class of someone else's.
+/// Downcasts `certificate`.
+/// @throws TypeMismatchException when it is an instance of another class.
 const CertificateImpl &AsImpl(const Certificate &certificate);
 
 } // namespace Tarvel::Crypto

@@ -13,7 +13,7 @@ namespace Tarvel::Crypto {
 
 namespace {
 
-// Held to the end of the process: OpenSSL may have cleaned itself up before our own destructors run.
+// Never freed: OpenSSL may have cleaned itself up before static objects are destroyed.
 const EVP_MD *FetchDigestMethod(const char *name) {
   const OpenSslErrorScope errors;
   const EVP_MD *const method = EVP_MD_fetch(GetLibraryContext(), name, nullptr);
@@ -23,7 +23,7 @@ const EVP_MD *FetchDigestMethod(const char *name) {
   return method;
 }
 
-// Of SHA-256 alone: nearly every digest is one, and OpenSSL wipes its last block of the message when it ends.
+// Only for SHA-256, which nearly all digests use. A finished context contains nothing of the message: OpenSSL wipes it.
 constinit KeptContexts<DigestContextHandle, 1> keptContexts;
 
 bool IsKept(DigestAlgorithm algorithm) {
@@ -54,11 +54,11 @@ const EVP_MD *GetDigestMethod(DigestAlgorithm algorithm) {
 }
 
 Digest::Digest(DigestAlgorithm algorithm) : m_algorithm(algorithm), m_context(nullptr) {
-  OpenSslUse::Prepare();
-  m_use.Require();
+  OpenSslGuard::Prepare();
+  m_guard.Require();
   m_errors.emplace();
   const EVP_MD *const method = GetDigestMethod(algorithm);
-  DigestContextHandle context = IsKept(algorithm) ? keptContexts.Take(0) : nullptr;
+  DigestContextHandle context = IsKept(algorithm) ? keptContexts.Acquire(0) : nullptr;
   if (!context) {
     context.reset(EVP_MD_CTX_new());
   }
@@ -68,7 +68,7 @@ Digest::Digest(DigestAlgorithm algorithm) : m_algorithm(algorithm), m_context(nu
   m_context = context.release();
 }
 
-// A context in the middle of a message may hold a piece of it, and OpenSSL wipes what it frees.
+// An unfinished context may contain part of the message. It is not kept but freed, and OpenSSL wipes what it frees.
 Digest::~Digest() {
   EVP_MD_CTX_free(AsDigestContext(m_context));
 }
@@ -84,7 +84,7 @@ void Digest::Finish(std::uint8_t *out) {
     m_errors->Throw("Failed to finish a digest");
   }
   if (IsKept(m_algorithm)) {
-    keptContexts.Put(0, DigestContextHandle(AsDigestContext(std::exchange(m_context, nullptr))));
+    keptContexts.Return(0, DigestContextHandle(AsDigestContext(std::exchange(m_context, nullptr))));
   }
 }
 

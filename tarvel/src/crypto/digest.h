@@ -5,7 +5,7 @@
 #pragma once
 
 #include "crypto/openssl_errors.h"
-#include "crypto/openssl_use.h"
+#include "crypto/openssl_guard.h"
 
 #include <cstddef>
 #include <cstdint>
@@ -22,8 +22,8 @@ constexpr std::size_t DigestBytes(DigestAlgorithm algorithm) noexcept {
   return algorithm == DigestAlgorithm::SHA256 ? 32 : algorithm == DigestAlgorithm::SHA384 ? 48 : 64;
 }
 
-/// A digest that is being computed. For one thread, and a local variable there: what else uses OpenSSL on the thread
-/// meanwhile must end first.
+/// A digest that is being computed. For one thread, and only as a local variable: every other use of OpenSSL that the thread
+/// begins after this one must end before it.
 class Digest {
 public:
   /// @throws CryptoException when the cryptographic library does not offer the algorithm; InvalidStateException when it has
@@ -33,15 +33,16 @@ public:
   Digest &operator=(const Digest &) = delete;
   ~Digest();
 
-  /// This and `Finish`: @throws CryptoException, OutOfMemoryException
+  /// Adds `bytes` to the message.
+  /// @throws CryptoException, OutOfMemoryException; `Finish` as well.
   void Update(std::string_view bytes);
 
   /// Writes `DigestBytes(algorithm)` bytes to `out`; the digest must not be used afterwards.
   void Finish(std::uint8_t *out);
 
 private:
-  const OpenSslUse m_use;
-  std::optional<OpenSslErrorScope> m_errors; // always there, but begun only when OpenSSL may be called
+  const OpenSslGuard m_guard;
+  std::optional<OpenSslErrorScope> m_errors; // set by the constructor once it knows that OpenSSL may be called
   const DigestAlgorithm m_algorithm;
   void *m_context; // EVP_MD_CTX; null once it is finished
 };

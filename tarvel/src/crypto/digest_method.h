@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// OpenSSL's implementation of each digest algorithm, looked up once in the life of the process.
+/// OpenSSL's implementation of each digest algorithm, looked up once per process.
 
 #pragma once
 

@@ -1,10 +1,10 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// `KeptContexts`, contexts of OpenSSL that are ready for the next use.
+/// `KeptContexts`, a pool of OpenSSL contexts for reuse.
 
 #pragma once
 
-#include "system/thread_lane.h"
+#include "core/thread_shard.h"
 
 #include <array>
 #include <atomic>
@@ -12,8 +12,8 @@
 
 namespace Tarvel::Crypto {
 
-/// To make a context costs allocations, and atomic operations on counters that all threads share. A context is for one
-/// thread at a time: so a thread takes one, uses it and returns it, the one of its own lane if it is there.
+/// A pool of contexts: creating one costs allocations, and atomic operations on counters that all threads share. A context
+/// serves one thread at a time. A thread acquires one, that of its own shard if possible, uses it and returns it.
 /// `Handle` is one of the owning handles; there are `KINDS` kinds of contexts, numbered from 0. Lock-free; safe on any
 /// thread. The destructor frees nothing, so that a static object never calls OpenSSL after the end of `main`.
 template <typename Handle, std::size_t KINDS>
@@ -23,9 +23,9 @@ public:
   KeptContexts(const KeptContexts &) = delete;
   KeptContexts &operator=(const KeptContexts &) = delete;
 
-  /// A kept context of that kind; null when none is kept.
-  Handle Take(std::size_t kind) noexcept {
-    for (std::size_t distance = 0; distance < LANES; ++distance) {
+  /// A kept context of that kind; null if there is none.
+  Handle Acquire(std::size_t kind) noexcept {
+    for (std::size_t distance = 0; distance < SHARDS; ++distance) {
       Slot &slot = GetSlot(distance, kind);
       if (!slot.load(std::memory_order_relaxed)) {
         continue;
@@ -37,9 +37,9 @@ public:
     return nullptr;
   }
 
-  /// Keeps `context` for the next taker, or frees it when enough are kept already.
-  void Put(std::size_t kind, Handle context) noexcept {
-    for (std::size_t distance = 0; distance < LANES; ++distance) {
+  /// Keeps `context` for reuse, or frees it if enough are kept already.
+  void Return(std::size_t kind, Handle context) noexcept {
+    for (std::size_t distance = 0; distance < SHARDS; ++distance) {
       Pointer expected = nullptr;
       if (GetSlot(distance, kind)
               .compare_exchange_strong(expected, context.get(), std::memory_order_release, std::memory_order_relaxed)) {
@@ -49,31 +49,31 @@ public:
     }
   }
 
-  /// Frees all that is kept. For the owner alone, when nobody else uses the object.
+  /// Frees all kept contexts. Only for the owner, while no other thread uses the object.
   void FreeAll() noexcept {
-    for (Lane &lane : m_lanes) {
-      for (Slot &slot : lane.slots) {
+    for (Shard &shard : m_shards) {
+      for (Slot &slot : shard.slots) {
         const Handle freed(slot.exchange(nullptr, std::memory_order_relaxed));
       }
     }
   }
 
 private:
-  static constexpr std::size_t LANES = 4; // threads beyond these that use contexts of one kind at once make their own
+  static constexpr std::size_t SHARDS = 4; // if more threads use one kind at once, the others make their own
 
   using Pointer = typename Handle::pointer;
   using Slot = std::atomic<Pointer>;
 
-  struct alignas(System::LANE_ALIGNMENT) Lane {
+  struct alignas(SHARD_ALIGNMENT) Shard {
     std::array<Slot, KINDS> slots{};
   };
 
-  /// `distance` is counted in lanes from the calling thread's own.
+  /// The slot that is `distance` shards after that of the calling thread.
   Slot &GetSlot(std::size_t distance, std::size_t kind) noexcept {
-    return m_lanes[(System::GetThreadLane(LANES) + distance) % LANES].slots[kind];
+    return m_shards[(GetThreadShard(SHARDS) + distance) % SHARDS].slots[kind];
   }
 
-  std::array<Lane, LANES> m_lanes{};
+  std::array<Shard, SHARDS> m_shards{};
 };
 
 } // namespace Tarvel::Crypto

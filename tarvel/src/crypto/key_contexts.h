@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// Contexts that are set up to check or to make signatures, kept with the certificate or the private key that they use.
+/// `KeyContexts`, the contexts that a certificate or a private key keeps for checking or making signatures.
 
 #pragma once
 
@@ -13,9 +13,8 @@
 
 namespace Tarvel::Crypto {
 
-/// Contexts of one operation, checking or making signatures, and of one key. To set one up costs a fifth of an RSA check,
-/// and a context is for one thread at a time: so a thread takes one, uses it and returns it, the one of its own lane if it
-/// is there. Lock-free; safe on any thread.
+/// Contexts for one key and one operation, which is checking signatures or making them. Setting up a context costs a fifth of
+/// an RSA check, so contexts are kept for reuse. Lock-free; safe on any thread.
 class KeyContexts {
 public:
   KeyContexts() = default;
@@ -23,14 +22,14 @@ public:
   KeyContexts &operator=(const KeyContexts &) = delete;
   ~KeyContexts() { m_contexts.FreeAll(); }
 
-  /// A context set up for `scheme` and `algorithm`; null when none is kept.
-  KeyContextHandle Take(SignatureScheme scheme, DigestAlgorithm algorithm) noexcept {
-    return m_contexts.Take(KindOf(scheme, algorithm));
+  /// A context set up for `scheme` and `algorithm`; null if none is kept.
+  KeyContextHandle Acquire(SignatureScheme scheme, DigestAlgorithm algorithm) noexcept {
+    return m_contexts.Acquire(KindOf(scheme, algorithm));
   }
 
-  /// Keeps `context` for the next taker, or frees it when enough are kept already.
-  void Put(SignatureScheme scheme, DigestAlgorithm algorithm, KeyContextHandle context) noexcept {
-    m_contexts.Put(KindOf(scheme, algorithm), std::move(context));
+  /// Keeps `context` for reuse, or frees it if enough are kept already.
+  void Return(SignatureScheme scheme, DigestAlgorithm algorithm, KeyContextHandle context) noexcept {
+    m_contexts.Return(KindOf(scheme, algorithm), std::move(context));
   }
 
 private:

@@ -13,12 +13,13 @@ constexpr std::size_t MAX_FILE_BYTES = std::size_t{16} << 20;
 
 } // namespace
 
-KeyFileText::KeyFileText(const std::string &path) : m_text(OpenFile(path)->ReadToEnd(MAX_FILE_BYTES)) {
-  if (m_text.size() > MAX_FILE_BYTES) {
-    SecureWipe(m_text);
+SecretText ReadKeyFile(const std::string &path) {
+  SecretText text(OpenFile(path)->ReadToEnd(MAX_FILE_BYTES));
+  if (text.Get().size() > MAX_FILE_BYTES) {
     throw CryptoException(StringUtil::Shorten(path) + ": file is longer than " + std::to_string(MAX_FILE_BYTES) +
                           " bytes");
   }
+  return text;
 }
 
 } // namespace Tarvel::Crypto

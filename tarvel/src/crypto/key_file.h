@@ -1,37 +1,25 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// Reading a file of keys or certificates, and saying in each error which file it was.
+/// Reading files of keys or certificates, and adding their paths to errors.
 
 #pragma once
 
-#include <tarvel/core/secure_wipe.h>
+#include <tarvel/core/secret_text.h>
 #include <tarvel/core/string_util.h>
 #include <tarvel/crypto/private_key.h>
 
 #include <string>
-#include <utility>
 
 namespace Tarvel::Crypto {
 
-/// What a file holds. It may be a private key: the text is wiped when it goes.
-class KeyFileText {
-public:
-  /// @throws IOException when the file cannot be read. @throws CryptoException when it is longer than 16 MiB.
-  explicit KeyFileText(const std::string &path);
-  KeyFileText(const KeyFileText &) = delete;
-  KeyFileText &operator=(const KeyFileText &) = delete;
-  ~KeyFileText() { SecureWipe(m_text); }
+/// The content of a file, which may be a private key.
+/// @throws IOException when the file cannot be read. @throws CryptoException when it is longer than 16 MiB.
+SecretText ReadKeyFile(const std::string &path);
 
-  std::string_view Get() const { return m_text; }
-
-private:
-  std::string m_text;
-};
-
-/// What `function` returns; its `CryptoException` or `IOException` comes as the same class, the message beginning with
-/// `path`.
+/// Returns what `function` returns. If it throws a `CryptoException` or an `IOException`, throws one of the same class whose
+/// message begins with `path`.
 template <typename Function>
-auto NamingPath(const std::string &path, Function function) {
+auto WithPathInErrors(const std::string &path, Function function) {
   try {
     return function();
   } catch (const WrongPassphraseException &error) {

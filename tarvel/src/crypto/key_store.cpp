@@ -25,12 +25,12 @@ Pkcs12Handle Decode(std::string_view der) {
   const OpenSslErrorScope errors;
   const auto *const begin = reinterpret_cast<const unsigned char *>(der.data());
   const unsigned char *position = begin;
-  // The context is kept with the store.
+  // The store keeps the library context for later calls.
   PKCS12 *blank = PKCS12_init_ex(NID_pkcs7_data, GetLibraryContext(), nullptr);
   if (!blank) {
     throw OutOfMemoryException();
   }
-  Pkcs12Handle store(d2i_PKCS12(&blank, &position, static_cast<long>(der.size()))); // frees it when it fails
+  Pkcs12Handle store(d2i_PKCS12(&blank, &position, static_cast<long>(der.size()))); // frees `blank` on failure
   if (!store) {
     errors.Throw("The PKCS#12 key store does not decode");
   }
@@ -40,7 +40,7 @@ Pkcs12Handle Decode(std::string_view der) {
   return store;
 }
 
-// An empty password is written in two ways, as no characters and as none at all; both need no asking.
+// There are two encodings of an empty passphrase, null and the empty text. Neither needs the callback.
 bool OpensWithoutPassphrase(PKCS12 *store) {
   const OpenSslErrorScope errors;
   const bool opens = PKCS12_verify_mac(store, nullptr, 0) == 1 || PKCS12_verify_mac(store, "", 0) == 1;
@@ -78,7 +78,7 @@ NativeKeyStore Open(PKCS12 *store, const std::string &passphrase) {
   if (opened != 1) {
     errors.Throw("The PKCS#12 key store cannot be read");
   }
-  errors.RequireMemory(); // without which certificates are left out and nothing is said
+  errors.RequireMemory(); // without memory, OpenSSL leaves out certificates and reports success
   return native;
 }
 
@@ -96,11 +96,11 @@ Ref<const Certificate> ToCertificate(X509 *native) {
 } // namespace
 
 KeyStore CreateKeyStoreFromPkcs12(std::string_view der, const PassphraseCallback &passphrase) {
-  OpenSslUse::Prepare();
-  OpenSslUse use;
-  use.Require();
+  OpenSslGuard::Prepare();
+  OpenSslGuard guard;
+  guard.Require();
   const Pkcs12Handle store = Decode(der);
-  Passphrase secret(passphrase, use);
+  Passphrase secret(passphrase, guard);
   NativeKeyStore native = Open(store.get(), FindPassphrase(store.get(), secret));
   if (!native.key) {
     throw NoKeyException("There is no private key in the PKCS#12 key store");
@@ -116,8 +116,8 @@ KeyStore CreateKeyStoreFromPkcs12(std::string_view der, const PassphraseCallback
 }
 
 KeyStore LoadKeyStore(const std::string &path, const PassphraseCallback &passphrase) {
-  const KeyFileText file(path);
-  return NamingPath(path, [&] { return CreateKeyStoreFromPkcs12(file.Get(), passphrase); });
+  const SecretText file = ReadKeyFile(path);
+  return WithPathInErrors(path, [&] { return CreateKeyStoreFromPkcs12(file.Get(), passphrase); });
 }
 
 } // namespace Tarvel::Crypto

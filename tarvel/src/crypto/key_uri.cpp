@@ -20,7 +20,7 @@ namespace {
 constexpr std::string_view SCHEME_LETTERS = "ABCDEFGHIJKLMNOPQRSTUVWXYZabcdefghijklmnopqrstuvwxyz";
 constexpr std::string_view SCHEME_CHARACTERS = "ABCDEFGHIJKLMNOPQRSTUVWXYZabcdefghijklmnopqrstuvwxyz0123456789+-.";
 
-// What a store's loader asks us, and what came of it: no exception may cross OpenSSL's frames.
+// The state of the callback for a passphrase. It stores its exception, which must not pass through OpenSSL's frames.
 struct PassphraseQuestion {
   Passphrase passphrase;
   bool asked = false;
@@ -66,7 +66,7 @@ KeyHandle LoadNextKey(OSSL_STORE_CTX *store, const OpenSslErrorScope &errors, co
       ThrowStoreFailure(errors, question);
     }
     if (!info && OSSL_STORE_error(store)) {
-      return nullptr; // without an error's code: what is there is something else than a key
+      return nullptr; // an error without a code: the content is not a key
     }
     if (info && OSSL_STORE_INFO_get_type(info.get()) == OSSL_STORE_INFO_PKEY) {
       return KeyHandle(OSSL_STORE_INFO_get1_PKEY(info.get()));
@@ -88,12 +88,12 @@ bool IsKeyUri(const std::string &text) {
 }
 
 Ref<const PrivateKey> LoadPrivateKeyFromUri(const std::string &uri, const PassphraseCallback &passphrase) {
-  OpenSslUse::Prepare();
-  OpenSslUse use;
-  use.Require();
+  OpenSslGuard::Prepare();
+  OpenSslGuard guard;
+  guard.Require();
   const OpenSslErrorScope errors;
-  PassphraseQuestion question{Passphrase(passphrase, use), false, nullptr};
-  // Without a method of ours, a loader would ask on the terminal of the host.
+  PassphraseQuestion question{Passphrase(passphrase, guard), false, nullptr};
+  // Without this method, a loader would ask on the host's terminal.
   const UiMethodHandle ui(UI_UTIL_wrap_read_pem_callback(AnswerPassphrase, 0));
   if (!ui) {
     throw OutOfMemoryException();

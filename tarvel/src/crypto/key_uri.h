@@ -10,11 +10,11 @@
 
 namespace Tarvel::Crypto {
 
-/// Whether `text` begins with an URI scheme (RFC 3986, section 3.1) of two or more characters and a colon. A file of
+/// Whether `text` begins with a URI scheme (RFC 3986, section 3.1) of two or more characters and a colon. A file of
 /// such a name is written "./name".
 bool IsKeyUri(const std::string &text);
 
-/// @throws NoKeyException, WrongPassphraseException, CryptoException, IOException as `LoadPrivateKey`, without the URI
+/// @throws NoKeyException, WrongPassphraseException, CryptoException, IOException as `LoadPrivateKey` does, without the URI
 /// in the message.
 Ref<const PrivateKey> LoadPrivateKeyFromUri(const std::string &uri, const PassphraseCallback &passphrase);
 

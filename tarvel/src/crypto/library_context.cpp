@@ -3,7 +3,7 @@
 #include "crypto/library_context.h"
 
 #include "crypto/openssl_errors.h"
-#include "crypto/openssl_use.h"
+#include "crypto/openssl_guard.h"
 
 #include <tarvel/crypto/certificate.h>
 #include <tarvel/crypto/system_configuration.h>
@@ -26,13 +26,13 @@ std::atomic<Configuration> configuration{Configuration::UNDECIDED};
 // Never freed: threads that run until the process ends use it.
 std::atomic<OSSL_LIB_CTX *> libraryContext{nullptr};
 
-/// What is decided; `wanted`, when nothing was before.
+/// The decision, which is `wanted` if none was made before.
 Configuration Decide(Configuration wanted) noexcept {
   Configuration decided = Configuration::UNDECIDED;
   return configuration.compare_exchange_strong(decided, wanted) ? wanted : decided;
 }
 
-/// Even a failure to load it must not make OpenSSL fall back on the default context's providers.
+/// Throws if the default provider cannot be loaded: without one, OpenSSL would use the providers of its default context.
 OSSL_LIB_CTX *CreateLibraryContext(const OpenSslErrorScope &errors) {
   OSSL_LIB_CTX *const context = OSSL_LIB_CTX_new();
   if (!context || !OSSL_PROVIDER_load(context, "default")) {
@@ -57,16 +57,16 @@ void InitialiseOpenSsl() {
   const bool isOfSystem = Decide(Configuration::NONE) == Configuration::OF_SYSTEM;
   const std::uint64_t configurationFlag = isOfSystem ? OPENSSL_INIT_LOAD_CONFIG : OPENSSL_INIT_NO_LOAD_CONFIG;
   // OpenSSL reads its configuration with the first context for TLS, unless a flag forbids it. Only the first such flag
-  // of a process counts.
-  const bool isUsable = OPENSSL_init_crypto(0, nullptr) == 1; // else it has cleaned itself up, or lacks memory
+  // in a process has an effect.
+  const bool isUsable = OPENSSL_init_crypto(0, nullptr) == 1; // not after its clean-up, or without memory
   if (!isUsable || OPENSSL_init_ssl(configurationFlag, nullptr) != 1) {
-    static std::atomic<bool> lackedMemory{false}; // OpenSSL does not try again what has failed once
+    static std::atomic<bool> lackedMemory{false}; // OpenSSL does not retry what has failed once
     lackedMemory = lackedMemory || errors.RanOutOfMemory();
     if (lackedMemory) {
       throw OutOfMemoryException();
     }
     if (!isUsable) {
-      throw InvalidStateException(OpenSslUse::ENDED);
+      throw InvalidStateException(OpenSslGuard::ENDED);
     }
     errors.Throw("Cannot initialise OpenSSL");
   }
@@ -86,9 +86,9 @@ void UseSystemConfiguration() {
     throw InvalidStateException(
         "The system's configuration of OpenSSL is asked for too late: OpenSSL is in use already");
   }
-  OpenSslUse::Prepare();
-  const OpenSslUse use;
-  use.Require();
+  OpenSslGuard::Prepare();
+  const OpenSslGuard guard;
+  guard.Require();
 }
 
 } // namespace Tarvel::Crypto

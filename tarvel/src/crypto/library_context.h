@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// The library context in which all of OpenSSL is used here, so that no configuration from outside changes what is accepted.
+/// The OpenSSL library context of this library, which keeps outside configuration from changing what is accepted.
 
 #pragma once
 
@@ -8,17 +8,17 @@
 
 namespace Tarvel::Crypto {
 
-/// For every function of OpenSSL that takes a library context. Null, which means OpenSSL's default one, before
-/// `OpenSslUse::Prepare`, and when the machine's configuration is to count. Costs one load.
+/// The argument for every OpenSSL function that takes a library context. Null, which means OpenSSL's default context, before
+/// `OpenSslGuard::Prepare`, and when the machine's configuration applies. Costs one load.
 OSSL_LIB_CTX *GetLibraryContext() noexcept;
 
-/// Whether the host has asked for the machine's configuration. Final after `OpenSslUse::Prepare`.
+/// Whether the host has asked for the machine's configuration. Final after `OpenSslGuard::Prepare`.
 bool UsesSystemConfiguration() noexcept;
 
-/// For `OpenSslUse::Prepare`, once. @throws OutOfMemoryException, CryptoException
+/// Called once, by `OpenSslGuard::Prepare`. @throws OutOfMemoryException, CryptoException
 void InitialiseOpenSsl();
 
-/// Around functions that take no library context, on the calling thread.
+/// While it lives, the calling thread uses our library context in OpenSSL functions that take no such argument.
 class LibraryContextScope {
 public:
   LibraryContextScope() noexcept;

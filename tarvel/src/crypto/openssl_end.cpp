@@ -2,7 +2,7 @@
 
 #include "crypto/openssl_end.h"
 
-#include "system/fork_gate.h"
+#include "core/fork_gate.h"
 
 #include <mutex>
 
@@ -11,13 +11,13 @@ namespace Tarvel::Crypto {
 namespace {
 
 // Constant-initialised and never destroyed.
-System::ForkSafeMutex mutex;       // guards the list
+ForkSafeMutex mutex;               // guards the list
 OpenSslEndNotice *first = nullptr; // the newest
 
 } // namespace
 
 OpenSslEndNotice::OpenSslEndNotice(Function function, void *owner) noexcept : m_function(function), m_owner(owner) {
-  const std::lock_guard<System::ForkSafeMutex> lock(mutex);
+  const std::lock_guard<ForkSafeMutex> lock(mutex);
   m_next = first;
   if (m_next) {
     m_next->m_previous = this;
@@ -26,7 +26,7 @@ OpenSslEndNotice::OpenSslEndNotice(Function function, void *owner) noexcept : m_
 }
 
 void OpenSslEndNotice::Withdraw() noexcept {
-  const std::lock_guard<System::ForkSafeMutex> lock(mutex);
+  const std::lock_guard<ForkSafeMutex> lock(mutex);
   if (first == this) {
     first = m_next;
   }
@@ -40,14 +40,14 @@ void OpenSslEndNotice::Withdraw() noexcept {
 }
 
 void OpenSslEndNotice::CallAll() noexcept {
-  const std::lock_guard<System::ForkSafeMutex> lock(mutex);
+  const std::lock_guard<ForkSafeMutex> lock(mutex);
   while (OpenSslEndNotice *const notice = first) {
     first = notice->m_next;
     if (first) {
       first->m_previous = nullptr;
     }
     notice->m_next = nullptr;
-    if (notice->m_generation == System::GetForkGeneration()) {
+    if (notice->m_generation == GetForkGeneration()) {
       notice->m_function(notice->m_owner);
     }
   }

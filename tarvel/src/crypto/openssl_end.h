@@ -1,15 +1,15 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// Being called when OpenSSL cleans itself up, for objects whose operations would wait for something else for ever.
+/// `OpenSslEndNotice`, for objects whose operations would wait forever once OpenSSL has cleaned itself up.
 
 #pragma once
 
-#include "system/fork_gate.h"
+#include "core/fork_gate.h"
 
 namespace Tarvel::Crypto {
 
-/// Has a function called, on the thread that ends the process, once no use of OpenSSL may begin any more and those that
-/// were going on have ended. Not in a child process that `fork` made later.
+/// Calls a function when OpenSSL cleans itself up: on the thread that ends the process, when no use of OpenSSL can begin and
+/// those under way have ended. The function is not called in a child process that is forked later.
 class OpenSslEndNotice {
 public:
   using Function = void (*)(void *owner) noexcept;
@@ -21,16 +21,16 @@ public:
   OpenSslEndNotice &operator=(const OpenSslEndNotice &) = delete;
   ~OpenSslEndNotice() { Withdraw(); }
 
-  /// Waits for a call that is under way. Any number of times.
+  /// Ends the notice, after waiting for a call that is under way. May be called any number of times.
   void Withdraw() noexcept;
 
-  /// Calls all that there are, and forgets them.
+  /// Calls the functions of all notices, each once.
   static void CallAll() noexcept;
 
 private:
   const Function m_function;
   void *const m_owner;
-  const unsigned m_generation = System::GetForkGeneration();
+  const unsigned m_generation = GetForkGeneration();
   // In a list of all notices, guarded by its mutex.
   OpenSslEndNotice *m_previous = nullptr;
   OpenSslEndNotice *m_next = nullptr;

@@ -14,7 +14,7 @@ namespace Tarvel::Crypto {
 
 namespace {
 
-constexpr std::size_t ERROR_TEXT_BYTES = 256; // what OpenSSL documents as enough
+constexpr std::size_t ERROR_TEXT_BYTES = 256; // enough, as OpenSSL documents
 
 std::string DescribeError(unsigned long code, const char *data, int flags) {
   std::array<char, ERROR_TEXT_BYTES> text{};
@@ -28,9 +28,8 @@ std::string DescribeError(unsigned long code, const char *data, int flags) {
 
 } // namespace
 
-// OpenSSL does not always put a failed allocation on its queue: it may have none for want of memory, or take the error off
-// again because it means to try something else. But then `malloc` has set errno, which nothing in OpenSSL's computations
-// resets.
+// OpenSSL does not always queue the error of a failed allocation: the queue itself may lack memory, or OpenSSL removes the
+// error before it tries something else. But `malloc` has set errno, and OpenSSL's computations do not reset it.
 OpenSslErrorScope::OpenSslErrorScope() noexcept : m_errnoOfHost(errno) {
   errno = 0;
   if (ERR_peek_last_error_all(&m_newestOfHost, nullptr, nullptr, nullptr, nullptr) == 0) {
@@ -39,7 +38,7 @@ OpenSslErrorScope::OpenSslErrorScope() noexcept : m_errnoOfHost(errno) {
   ERR_set_mark();
 }
 
-// Without an entry to mark, OpenSSL sets no mark, and popping to the mark empties the queue: as it was found.
+// In an empty queue OpenSSL sets no mark; popping to the mark then empties the queue, which is the state to restore.
 OpenSslErrorScope::~OpenSslErrorScope() {
   const bool ranOut = errno == ENOMEM; // for a scope around this one
   ERR_pop_to_mark();

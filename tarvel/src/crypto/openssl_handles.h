@@ -1,10 +1,10 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// Owning handles for the objects of OpenSSL: each is freed when its handle goes, unless OpenSSL has cleaned itself up.
+/// Owning handles for OpenSSL's objects. A handle frees its object, unless OpenSSL has cleaned itself up.
 
 #pragma once
 
-#include "crypto/openssl_use.h"
+#include "crypto/openssl_guard.h"
 
 #include <openssl/bio.h>
 #include <openssl/ec.h>
@@ -18,15 +18,15 @@
 
 namespace Tarvel::Crypto {
 
-/// Frees a handle by the function that OpenSSL has for it.
+/// Frees an object with the OpenSSL function for its type.
 template <auto FREE>
 struct OpenSslDeleter {
   template <typename T>
   void operator()(T *handle) const noexcept {
-    if (const OpenSslUse use; use) {
+    if (const OpenSslGuard guard; guard) {
       FREE(handle);
     } else {
-      OpenSslUse::Abandon(handle);
+      OpenSslGuard::Abandon(handle);
     }
   }
 };

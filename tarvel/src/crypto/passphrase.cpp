@@ -2,28 +2,22 @@
 
 #include "crypto/passphrase.h"
 
-#include "system/fork_gate.h"
-
-#include <tarvel/core/secure_wipe.h>
+#include "core/fork_gate.h"
 
 namespace Tarvel::Crypto {
 
-Passphrase::~Passphrase() {
-  SecureWipe(m_text);
-}
-
-// Asking may take as long as somebody types, and may start a program that asks.
-std::string Passphrase::Ask() {
-  m_use.Suspend();
+// The callback may wait while the user types, or start a program that asks.
+SecretText Passphrase::Ask() {
+  m_guard.Suspend();
   try {
-    std::string answer = [this] {
-      const System::HostCall call;
-      return m_ask();
+    SecretText answer = [this] {
+      const HostCall call;
+      return SecretText(m_ask());
     }();
-    m_use.Resume();
+    m_guard.Resume();
     return answer;
   } catch (...) {
-    m_use.Resume();
+    m_guard.Resume();
     throw;
   }
 }
@@ -34,12 +28,10 @@ const std::string &Passphrase::Get() {
   }
   if (!m_asked) {
     m_asked = true;
-    std::string answer = Ask();
-    m_text.swap(answer); // needs no memory, so that nothing is thrown before the answer is wiped
-    SecureWipe(answer);  // a short text is not moved but copied: what is left of the answer is a secret too
+    m_text = Ask();
   }
-  m_use.Require();
-  return m_text;
+  m_guard.Require();
+  return m_text.Get();
 }
 
 } // namespace Tarvel::Crypto

@@ -1,11 +1,12 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// A passphrase that is asked for when it is first needed, and wiped.
+/// `Passphrase`, which asks the host for a passphrase when it is first needed, and wipes it.
 
 #pragma once
 
-#include "crypto/openssl_use.h"
+#include "crypto/openssl_guard.h"
 
+#include <tarvel/core/secret_text.h>
 #include <tarvel/crypto/private_key.h>
 
 #include <string>
@@ -15,24 +16,23 @@ namespace Tarvel::Crypto {
 /// Asks its callback at most once, on the thread that first needs the passphrase.
 class Passphrase {
 public:
-  /// `ask`, and `use` in the middle of which it is called, must live as long as this.
-  Passphrase(const PassphraseCallback &ask, OpenSslUse &use) : m_ask(ask), m_use(use) {}
+  /// Both must outlive this object. `guard` is suspended while `ask` runs.
+  Passphrase(const PassphraseCallback &ask, OpenSslGuard &guard) : m_ask(ask), m_guard(guard) {}
   Passphrase(const Passphrase &) = delete;
   Passphrase &operator=(const Passphrase &) = delete;
-  ~Passphrase();
 
-  /// The passphrase, wiped with this object.
+  /// The passphrase, valid as long as this object.
   /// @throws WrongPassphraseException when there is no callback; whatever the callback throws; InvalidStateException when
-  ///         OpenSSL has cleaned itself up meanwhile.
+  ///         OpenSSL has cleaned itself up in the meantime.
   const std::string &Get();
 
 private:
-  std::string Ask();
+  SecretText Ask();
 
   const PassphraseCallback &m_ask;
-  OpenSslUse &m_use;
+  OpenSslGuard &m_guard;
   bool m_asked = false;
-  std::string m_text;
+  SecretText m_text;
 };
 
 } // namespace Tarvel::Crypto

@@ -38,9 +38,9 @@ PemReader::PemReader(std::string_view text) : m_blocksLeft(CountOccurrences(text
   if (text.size() > MAX_TEXT_BYTES) {
     throw CryptoException("PEM text of " + std::to_string(text.size()) + " bytes is too long");
   }
-  OpenSslUse::Prepare();
-  const OpenSslUse use;
-  use.Require();
+  OpenSslGuard::Prepare();
+  const OpenSslGuard guard;
+  guard.Require();
   const OpenSslErrorScope errors;
   m_bio.reset(BIO_new_mem_buf(text.data(), static_cast<int>(text.size())));
   if (!m_bio) {
@@ -54,12 +54,12 @@ bool PemReader::Next(PemBlock &block) {
     return false;
   }
   --m_blocksLeft;
-  const OpenSslUse use;
-  use.Require();
+  const OpenSslGuard guard;
+  guard.Require();
   const OpenSslErrorScope errors;
   if (PEM_read_bio_ex(m_bio.get(), &block.m_label, &block.m_headers, &block.m_data, &block.m_length,
                       PEM_FLAG_SECURE | PEM_FLAG_EAY_COMPATIBLE) != 1) {
-    // Also when OpenSSL sees no further block: a cut begin line must not make a certificate of a bundle disappear.
+    // Also if OpenSSL finds no further block: a truncated begin line must not hide a certificate of a bundle.
     errors.Throw("Malformed PEM text");
   }
   block.m_allocated = block.m_length;

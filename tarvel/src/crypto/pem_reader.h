@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// Reading PEM text (RFC 7468 and its forerunner RFC 1421) block by block.
+/// Reading PEM text (RFC 7468 and its predecessor RFC 1421) block by block.
 
 #pragma once
 
@@ -13,7 +13,7 @@
 
 namespace Tarvel::Crypto {
 
-/// One block of PEM text. Its bytes may be a private key's: they are wiped when it goes.
+/// One block of PEM text. It may contain a private key, so its bytes are wiped when it is destroyed.
 class PemBlock {
 public:
   PemBlock() = default;
@@ -21,16 +21,16 @@ public:
   PemBlock &operator=(const PemBlock &) = delete;
   ~PemBlock() { Clear(); }
 
-  /// The label, as "CERTIFICATE".
+  /// The label, such as "CERTIFICATE".
   std::string_view GetLabel() const { return m_label; }
   bool IsCertificate() const { return GetLabel() == "CERTIFICATE" || GetLabel() == "X509 CERTIFICATE"; }
   bool IsPrivateKey() const { return GetLabel().ends_with("PRIVATE KEY"); }
 
-  /// The encapsulated headers of RFC 1421, as "Proc-Type: 4,ENCRYPTED"; empty when there are none.
+  /// The encapsulated headers of RFC 1421, such as "Proc-Type: 4,ENCRYPTED"; empty if there are none.
   char *GetHeaders() { return m_headers; }
   unsigned char *GetData() { return m_data; }
   long GetLength() const { return m_length; }
-  /// After decryption in place, the length of what came out.
+  /// Sets the length of the plaintext after decryption in place.
   void SetLength(long length) { m_length = length; }
 
 private:
@@ -44,15 +44,15 @@ private:
   long m_allocated = 0;
 };
 
-/// Gives the blocks of a text one after the other. The text must live as long as the reader.
+/// Reads the blocks of a text one after another. The text must outlive the reader.
 class PemReader {
 public:
-  /// @throws CryptoException when the text is longer than anything sensible (16 MiB); InvalidStateException when OpenSSL has
-  ///         cleaned itself up; OutOfMemoryException.
+  /// @throws CryptoException when the text is longer than 16 MiB; InvalidStateException when OpenSSL has cleaned itself up;
+  ///         OutOfMemoryException.
   explicit PemReader(std::string_view text);
 
   /// Reads the next block into `block`; false at the end of the text.
-  /// @throws CryptoException when a block has begun but is not well-formed; the others as the constructor.
+  /// @throws CryptoException when a block has begun but is not well-formed; otherwise as the constructor.
   bool Next(PemBlock &block);
 
   static bool LooksLikePem(std::string_view text) { return text.find(BEGIN_MARK) != std::string_view::npos; }

@@ -31,7 +31,7 @@ const unsigned char *BytesOf(std::string_view der) {
   return reinterpret_cast<const unsigned char *>(der.data());
 }
 
-// OpenSSL asks for a passphrase by this; `secret` is the text. It is longer than `size` only when it is wrong anyway.
+// OpenSSL's callback for a passphrase; `secret` is a `const std::string`. A text longer than `size` is wrong in any case.
 int GivePassphrase(char *buffer, int size, int, void *secret) {
   const std::string &text = *static_cast<const std::string *>(secret);
   if (text.size() > static_cast<std::size_t>(size)) {
@@ -41,8 +41,8 @@ int GivePassphrase(char *buffer, int size, int, void *secret) {
   return static_cast<int>(text.size());
 }
 
-// PKCS#8 or one of the traditional forms, not encrypted. Null when it does not decode, or bytes follow it; why not, the
-// caller's scope says.
+// PKCS#8 or one of the traditional forms, not encrypted. Null if it does not decode, or bytes follow it; the caller's
+// error scope has the reason.
 KeyHandle DecodePlain(std::string_view der) {
   const unsigned char *position = BytesOf(der);
   KeyHandle key(d2i_AutoPrivateKey_ex(nullptr, &position, static_cast<long>(der.size()), GetLibraryContext(), nullptr));
@@ -59,7 +59,7 @@ EncryptedKeyHandle DecodeEncrypted(std::string_view der) {
   return encrypted && position == BytesOf(der) + der.size() ? std::move(encrypted) : nullptr;
 }
 
-// A wrong passphrase shows by padding that does not come out, or, one time in 256, by a key that does not decode.
+// A wrong passphrase leads to wrong padding or, one time in 256, to a key that does not decode.
 KeyHandle Decrypt(const X509_SIG *encrypted, Passphrase &passphrase) {
   const std::string &secret = passphrase.Get();
   const OpenSslErrorScope errors;
@@ -86,7 +86,7 @@ KeyHandle DecodeEncryptedOrThrow(std::string_view der, Passphrase &passphrase) {
   return Decrypt(encrypted.get(), passphrase);
 }
 
-// The traditional form names its cipher in headers (RFC 1421), and is decrypted in place.
+// The traditional form has its cipher in headers (RFC 1421), and is decrypted in place.
 bool DecryptInPlace(PemBlock &block, Passphrase &passphrase) {
   const OpenSslErrorScope errors;
   EVP_CIPHER_INFO cipher{};
@@ -96,12 +96,10 @@ bool DecryptInPlace(PemBlock &block, Passphrase &passphrase) {
   if (!cipher.cipher) {
     return false;
   }
-  std::string secret = passphrase.Get();
+  const std::string &secret = passphrase.Get();
   long length = block.GetLength();
   const LibraryContextScope context;
-  const int decrypted = PEM_do_header(&cipher, block.GetData(), &length, GivePassphrase, &secret);
-  SecureWipe(secret);
-  if (decrypted != 1) {
+  if (PEM_do_header(&cipher, block.GetData(), &length, GivePassphrase, const_cast<std::string *>(&secret)) != 1) {
     throw WrongPassphraseException(errors.Describe(WRONG_PASSPHRASE));
   }
   block.SetLength(length);
@@ -173,10 +171,10 @@ PrivateKey::~PrivateKey() = default;
 
 Ref<const PrivateKey> CreatePrivateKey(std::string_view text, const PassphraseCallback &passphrase) {
   constexpr char DER_SEQUENCE = 0x30;
-  OpenSslUse::Prepare();
-  OpenSslUse use;
-  use.Require();
-  Passphrase secret(passphrase, use);
+  OpenSslGuard::Prepare();
+  OpenSslGuard guard;
+  guard.Require();
+  Passphrase secret(passphrase, guard);
   if (PemReader::LooksLikePem(text)) {
     return MakeRef<PrivateKeyImpl>(DecodePem(text, secret));
   }
@@ -188,20 +186,20 @@ Ref<const PrivateKey> CreatePrivateKey(std::string_view text, const PassphraseCa
 
 Ref<const PrivateKey> LoadPrivateKey(const std::string &pathOrUri, const PassphraseCallback &passphrase) {
   if (IsKeyUri(pathOrUri)) {
-    return NamingPath(pathOrUri, [&] { return LoadPrivateKeyFromUri(pathOrUri, passphrase); });
+    return WithPathInErrors(pathOrUri, [&] { return LoadPrivateKeyFromUri(pathOrUri, passphrase); });
   }
-  const KeyFileText file(pathOrUri);
-  return NamingPath(pathOrUri, [&] { return CreatePrivateKey(file.Get(), passphrase); });
+  const SecretText file = ReadKeyFile(pathOrUri);
+  return WithPathInErrors(pathOrUri, [&] { return CreatePrivateKey(file.Get(), passphrase); });
 }
 
 void RequireKeyMatchesCertificate(const PrivateKey &key, const Certificate &certificate) {
-  const OpenSslUse use;
-  use.Require();
+  const OpenSslGuard guard;
+  guard.Require();
   const OpenSslErrorScope errors;
   EVP_PKEY *const publicKey = AsImpl(certificate).GetNativeKey();
   if (!publicKey || EVP_PKEY_eq(publicKey, AsImpl(key).GetNative()) != 1) {
     errors.RequireMemory();
-    throw KeyMismatchException("The private key is not the one of the certificate " +
+    throw KeyMismatchException("The private key does not belong to the certificate " +
                                StringUtil::Shorten(certificate.GetSubject()));
   }
 }

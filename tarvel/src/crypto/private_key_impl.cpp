@@ -3,7 +3,7 @@
 #include "crypto/private_key_impl.h"
 
 #include "crypto/openssl_errors.h"
-#include "crypto/openssl_use.h"
+#include "crypto/openssl_guard.h"
 
 #include <typeinfo>
 #include <utility>
@@ -11,11 +11,11 @@
 namespace Tarvel::Crypto {
 
 PrivateKeyImpl::PrivateKeyImpl(KeyHandle native) : m_native(std::move(native)) {
-  const OpenSslUse use;
-  use.Require();
+  const OpenSslGuard guard;
+  guard.Require();
   const OpenSslErrorScope errors;
   m_bits = static_cast<unsigned>(EVP_PKEY_get_bits(m_native.get()));
-  if (m_bits == 0) { // which OpenSSL looks up when it reads a key, and keeps silent about memory
+  if (m_bits == 0) { // OpenSSL sets the size when it reads a key; without memory it silently does not
     throw OutOfMemoryException();
   }
   for (const char *const algorithm : {"RSA", "EC"}) {

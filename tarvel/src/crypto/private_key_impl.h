@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// The one implementation of `PrivateKey`, over OpenSSL's.
+/// The only implementation of `PrivateKey`, based on OpenSSL's.
 
 #pragma once
 
@@ -21,7 +21,7 @@ public:
   unsigned GetBits() const override { return m_bits; }
   KeyContexts &GetSignContexts() const noexcept { return m_signContexts; }
 
-  /// Owned by the key; OpenSSL counts its own references to it.
+  /// Owned by this object; OpenSSL counts its own references to it.
   EVP_PKEY *GetNative() const noexcept { return m_native.get(); }
 
 private:
@@ -33,8 +33,8 @@ private:
   mutable KeyContexts m_signContexts;
 };
 
-/// `key` as what it is.
-/// @throws TypeMismatchException when it is a class of someone else's.
+/// Downcasts `key`.
+/// @throws TypeMismatchException when it is an instance of another class.
 const PrivateKeyImpl &AsImpl(const PrivateKey &key);
 
 } // namespace Tarvel::Crypto

@@ -6,8 +6,8 @@
 #include "crypto/digest_method.h"
 #include "crypto/library_context.h"
 #include "crypto/openssl_errors.h"
+#include "crypto/openssl_guard.h"
 #include "crypto/openssl_handles.h"
-#include "crypto/openssl_use.h"
 #include "crypto/private_key_impl.h"
 
 #include <openssl/rsa.h>
@@ -29,7 +29,7 @@ bool IsCurve(KeyKind kind) {
   return kind == KeyKind::EC_P256 || kind == KeyKind::EC_P384 || kind == KeyKind::EC_P521;
 }
 
-bool FitsScheme(KeyKind kind, SignatureScheme scheme) {
+bool MatchesScheme(KeyKind kind, SignatureScheme scheme) {
   return IsRsaScheme(scheme) ? kind == KeyKind::RSA : IsCurve(kind);
 }
 
@@ -38,7 +38,7 @@ std::size_t BytesOf(unsigned bits) {
   return (bits + BITS_PER_BYTE - 1) / BITS_PER_BYTE;
 }
 
-// What follows EVP_PKEY_sign_init or EVP_PKEY_verify_init.
+// The settings that follow EVP_PKEY_sign_init or EVP_PKEY_verify_init.
 bool SetScheme(EVP_PKEY_CTX *context, SignatureScheme scheme, DigestAlgorithm algorithm) {
   const EVP_MD *const method = GetDigestMethod(algorithm);
   if (EVP_PKEY_CTX_set_signature_md(context, method) <= 0) {
@@ -57,7 +57,7 @@ bool SetScheme(EVP_PKEY_CTX *context, SignatureScheme scheme, DigestAlgorithm al
   return true;
 }
 
-// Each context has a key of its own, since OpenSSL locks a key for each use of it, and threads would wait for each other.
+// Each context has its own copy of the key: OpenSSL locks a key during each use, and threads would wait for each other.
 KeyContextHandle NewVerifyContext(EVP_PKEY *sharedKey, SignatureScheme scheme, DigestAlgorithm algorithm) {
   const OpenSslErrorScope errors;
   const KeyHandle key(EVP_PKEY_dup(sharedKey));
@@ -84,7 +84,7 @@ BignumHandle ReadNumber(const std::uint8_t *bytes, std::size_t length) {
   return BignumHandle(BN_bin2bn(bytes, static_cast<int>(length), nullptr));
 }
 
-// OpenSSL takes ECDSA values as a DER sequence of r and s, XML Signature as their octets side by side.
+// OpenSSL expects an ECDSA value as a DER sequence of r and s; XML Signature has their octets one after the other.
 std::vector<std::uint8_t> EncodeEcdsaValue(const std::uint8_t *value, std::size_t numberBytes) {
   const OpenSslErrorScope errors;
   BignumHandle r = ReadNumber(value, numberBytes);
@@ -125,7 +125,7 @@ bool Verify(EVP_PKEY_CTX *context, DigestAlgorithm algorithm, const std::uint8_t
     errors.Throw("Failed to check a signature");
   }
   if (answer == 0) {
-    errors.RequireMemory(); // OpenSSL answers no then as well
+    errors.RequireMemory(); // without memory, OpenSSL also answers "no"
   }
   return answer == 1;
 }
@@ -147,13 +147,13 @@ bool VerifyDigest(const Certificate &certificate, SignatureScheme scheme, Digest
   const CertificateImpl &impl = AsImpl(certificate);
   const std::size_t numberBytes = BytesOf(impl.GetKeyBits());
   const std::size_t expectedLength = IsRsaScheme(scheme) ? numberBytes : 2 * numberBytes;
-  if (!FitsScheme(impl.GetKeyKind(), scheme) || signatureLength != expectedLength) {
+  if (!MatchesScheme(impl.GetKeyKind(), scheme) || signatureLength != expectedLength) {
     return false;
   }
-  const OpenSslUse use;
-  use.Require();
+  const OpenSslGuard guard;
+  guard.Require();
   KeyContexts &contexts = impl.GetVerifyContexts();
-  KeyContextHandle context = contexts.Take(scheme, algorithm);
+  KeyContextHandle context = contexts.Acquire(scheme, algorithm);
   if (!context) {
     context = NewVerifyContext(impl.GetNativeKey(), scheme, algorithm);
   }
@@ -164,21 +164,21 @@ bool VerifyDigest(const Certificate &certificate, SignatureScheme scheme, Digest
     const std::vector<std::uint8_t> der = EncodeEcdsaValue(signature, numberBytes);
     genuine = Verify(context.get(), algorithm, digest, der.data(), der.size());
   }
-  contexts.Put(scheme, algorithm, std::move(context));
+  contexts.Return(scheme, algorithm, std::move(context));
   return genuine;
 }
 
 std::vector<std::uint8_t> SignDigest(const PrivateKey &key, SignatureScheme scheme, DigestAlgorithm algorithm,
                                      const std::uint8_t *digest) {
-  const OpenSslUse use;
-  use.Require();
+  const OpenSslGuard guard;
+  guard.Require();
   const OpenSslErrorScope errors;
   if (key.GetAlgorithm() != (IsRsaScheme(scheme) ? "RSA" : "EC")) {
     throw CryptoException("A key of algorithm " + key.GetAlgorithm() + " cannot make a signature of this scheme");
   }
   const PrivateKeyImpl &impl = AsImpl(key);
   KeyContexts &contexts = impl.GetSignContexts();
-  KeyContextHandle context = contexts.Take(scheme, algorithm);
+  KeyContextHandle context = contexts.Acquire(scheme, algorithm);
   if (!context) {
     context = NewSignContext(impl.GetNative(), scheme, algorithm);
   }
@@ -190,7 +190,7 @@ std::vector<std::uint8_t> SignDigest(const PrivateKey &key, SignatureScheme sche
   if (EVP_PKEY_sign(context.get(), value.data(), &length, digest, DigestBytes(algorithm)) <= 0) {
     errors.Throw("Failed to sign");
   }
-  contexts.Put(scheme, algorithm, std::move(context));
+  contexts.Return(scheme, algorithm, std::move(context));
   value.resize(length);
   return IsRsaScheme(scheme) ? value : DecodeEcdsaValue(value, BytesOf(key.GetBits()));
 }

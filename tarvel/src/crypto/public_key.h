@@ -20,22 +20,22 @@ enum class SignatureScheme { RSA_PKCS1, RSA_PSS, ECDSA };
 
 enum class KeyKind { RSA, EC_P256, EC_P384, EC_P521, OTHER };
 
-/// What kind of public key the certificate has; for RSA, `bits` is the modulus size.
+/// The kind of the certificate's public key; for RSA, `bits` is set to the size of the modulus.
 KeyKind GetKeyKind(const Certificate &certificate, unsigned &bits);
 
 /// Whether an RSA key's public exponent is odd and at least 3; true for other kinds of keys.
 bool HasSoundExponent(const Certificate &certificate);
 
 /// Whether `signature` is the signature by the certificate's key over a message with that digest. An ECDSA value is r
-/// and s one after the other, as XML Signature has it (RFC 4050, section 3.3). RSA-PSS: MGF1 with the same digest, salt
-/// as long as the digest. Malformed values answer false. Safe on any thread; costs little beyond the arithmetic.
+/// and s one after the other, as in XML Signature (RFC 4050, section 3.3). RSA-PSS: MGF1 with the same digest, salt
+/// as long as the digest. It is false for malformed values. Safe on any thread; costs little beyond the arithmetic.
 /// @throws CryptoException when the cryptographic library itself fails; InvalidStateException when it has cleaned itself up;
-///         OutOfMemoryException. None of these is an answer.
+///         OutOfMemoryException. None of these is a verdict.
 bool VerifyDigest(const Certificate &certificate, SignatureScheme scheme, DigestAlgorithm algorithm,
                   const std::uint8_t *digest, const std::uint8_t *signature, std::size_t signatureLength);
 
 /// The signature over a message with that digest, in the same encodings.
-/// @throws CryptoException when the key does not fit the scheme or the cryptographic library fails; InvalidStateException
+/// @throws CryptoException when the key does not match the scheme or the cryptographic library fails; InvalidStateException
 ///         when it has cleaned itself up; OutOfMemoryException.
 std::vector<std::uint8_t> SignDigest(const PrivateKey &key, SignatureScheme scheme, DigestAlgorithm algorithm,
                                      const std::uint8_t *digest);

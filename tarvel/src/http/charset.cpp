@@ -16,7 +16,7 @@ namespace Tarvel::Http {
 namespace {
 
 constexpr std::size_t MAX_CHARSET_LENGTH = 40;
-constexpr std::size_t MAX_DECLARATION_LENGTH = 256; // of an XML declaration that is looked into
+constexpr std::size_t MAX_DECLARATION_LENGTH = 256; // of an XML declaration; a longer one is not examined
 
 constexpr std::string_view XML_SPACE = " \t\r\n";
 
@@ -32,7 +32,7 @@ bool IsBeyondAscii(char c) noexcept {
   return static_cast<unsigned char>(c) > 0x7F;
 }
 
-/// Takes a parameter's value, a token or a quoted string, from the beginning of `rest`.
+/// Removes a parameter's value, a token or a quoted string, from the beginning of `rest`.
 std::string TakeValue(std::string_view &rest) {
   std::string value;
   if (rest.empty() || rest.front() != '"') {
@@ -44,7 +44,7 @@ std::string TakeValue(std::string_view &rest) {
   std::size_t at = 1;
   for (; at < rest.size() && rest[at] != '"'; ++at) {
     if (rest[at] == '\\' && at + 1 < rest.size()) {
-      ++at; // the character after it is taken as it is
+      ++at; // the character after it is literal
     }
     value.push_back(rest[at]);
   }
@@ -131,7 +131,7 @@ void RecodeToUtf8(std::string &body, std::string_view charset) {
   if (beyondAscii == 0 && !isDeclared) {
     return;
   }
-  constexpr std::string_view UTF8 = "UTF-8"; // shorter than the names that it replaces, or not much longer
+  constexpr std::string_view UTF8 = "UTF-8"; // at most a few bytes longer than the name that it replaces
   std::string recoded;
   recoded.reserve(body.size() + static_cast<std::size_t>(beyondAscii) + UTF8.size());
   const std::string_view whole = body;

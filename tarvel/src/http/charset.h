@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// The charset that the header of a response declares, and what it means for the body.
+/// The charset that the header of a response declares, and the conversion of the body to UTF-8.
 
 #pragma once
 
@@ -9,14 +9,14 @@
 
 namespace Tarvel::Http {
 
-/// The charset parameter of a media type (RFC 9110, section 8.3), as written but for its quotes. Empty without one,
-/// and when it is not a charset's name: a token of at most 40 characters (RFC 2978, section 2.3).
+/// The charset parameter of a media type (RFC 9110, section 8.3), as written but without quotes. Empty when there is
+/// none, or when its value is not the name of a charset: a token of at most 40 characters (RFC 2978, section 2.3).
 std::string FindCharset(std::string_view contentType);
 
-/// Makes UTF-8 of a body that is declared as ISO-8859-1, under any of the names that IANA lists. Left alone are a body that
-/// is not ASCII and is UTF-8 already, as a wrong declaration is more likely than such text, and a body that is declared as
-/// anything else. An XML declaration at its beginning that names ISO-8859-1 too then names UTF-8. What was there before is
-/// wiped.
+/// Converts a body that is declared as ISO-8859-1, under any of the names that IANA lists, to UTF-8. If the body also
+/// begins with an XML declaration that says ISO-8859-1, that then says UTF-8. The old memory of the body is wiped. Left
+/// alone are a body that is declared as anything else, and a body that is not ASCII but valid UTF-8, because a wrong
+/// declaration is more likely than such text in ISO-8859-1.
 void RecodeToUtf8(std::string &body, std::string_view charset);
 
 } // namespace Tarvel::Http

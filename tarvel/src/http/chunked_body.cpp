@@ -13,11 +13,13 @@ namespace Tarvel::Http {
 
 namespace {
 
+constexpr const char *NO_LINE_FEED = "a carriage return without a line feed";
+
 [[noreturn]] void Refuse(const char *what) {
   throw HttpException(std::string("the chunked body is broken: ") + what);
 }
 
-/// -1 for none.
+/// -1 when `c` is not a digit.
 int HexDigitValue(char c) noexcept {
   if (c >= '0' && c <= '9') {
     return c - '0';
@@ -32,7 +34,8 @@ void Require(char c, char expected, const char *what) {
   }
 }
 
-/// In a line that is passed over. A line feed alone could be a line's end to somebody else on the way.
+/// For a line that is skipped. It must not contain a line feed alone, which an intermediary could take for the line's
+/// end.
 void RequireText(char c) {
   if (IsControlCharacter(c) && c != '\t') {
     Refuse("a control character in an extension or the trailer");
@@ -62,6 +65,38 @@ std::size_t ChunkedBodyDecoder::Put(std::string_view bytes, std::string &body) {
 void ChunkedBodyDecoder::TakeCharacter(char c, std::size_t bodyLength) {
   switch (m_expected) {
   case Expected::SIZE:
+  case Expected::MORE_OF_SIZE:
+  case Expected::EXTENSION:
+  case Expected::SIZE_LINE_FEED:
+    TakeCharacterOfSizeLine(c, bodyLength);
+    return;
+  case Expected::DATA_RETURN:
+    Require(c, '\r', "a chunk longer than its size");
+    m_expected = Expected::DATA_LINE_FEED;
+    return;
+  case Expected::DATA_LINE_FEED:
+    Require(c, '\n', NO_LINE_FEED);
+    m_expected = Expected::SIZE;
+    return;
+  case Expected::TRAILER_LINE:
+  case Expected::MORE_OF_TRAILER_LINE:
+  case Expected::TRAILER_LINE_FEED:
+  case Expected::LAST_LINE_FEED:
+    TakeCharacterOfTrailer(c);
+    return;
+  case Expected::DATA:
+  case Expected::NOTHING:
+    return; // never called then: `Put` takes data in pieces, and takes nothing after the end
+  }
+}
+
+void ChunkedBodyDecoder::TakeCharacterOfSizeLine(char c, std::size_t bodyLength) {
+  if (m_expected == Expected::SIZE_LINE_FEED) {
+    Require(c, '\n', NO_LINE_FEED);
+    m_expected = m_size == 0 ? Expected::TRAILER_LINE : Expected::DATA;
+    return;
+  }
+  if (m_expected == Expected::SIZE) {
     if (HexDigitValue(c) < 0) {
       Refuse("a chunk without a size");
     }
@@ -69,54 +104,36 @@ void ChunkedBodyDecoder::TakeCharacter(char c, std::size_t bodyLength) {
     TakeSizeDigit(c, bodyLength);
     m_expected = Expected::MORE_OF_SIZE;
     return;
-  case Expected::MORE_OF_SIZE:
-    if (c == '\r') {
-      m_expected = Expected::SIZE_LINE_FEED;
-    } else if (c == ';' || c == ' ' || c == '\t') {
-      m_expected = Expected::EXTENSION;
-    } else {
-      TakeSizeDigit(c, bodyLength);
-    }
+  }
+  if (c == '\r') {
+    m_expected = Expected::SIZE_LINE_FEED;
     return;
-  case Expected::EXTENSION:
-    if (c == '\r') {
-      m_expected = Expected::SIZE_LINE_FEED;
-      return;
-    }
+  }
+  if (m_expected == Expected::EXTENSION) {
     RequireText(c);
     CountOverhead();
     return;
-  case Expected::SIZE_LINE_FEED:
-    Require(c, '\n', "a carriage return without a line feed");
-    m_expected = m_size == 0 ? Expected::TRAILER_LINE : Expected::DATA;
+  }
+  if (c == ';' || c == ' ' || c == '\t') {
+    m_expected = Expected::EXTENSION;
     return;
-  case Expected::DATA_RETURN:
-    Require(c, '\r', "a chunk longer than its size");
-    m_expected = Expected::DATA_LINE_FEED;
-    return;
-  case Expected::DATA_LINE_FEED:
-    Require(c, '\n', "a carriage return without a line feed");
-    m_expected = Expected::SIZE;
-    return;
-  case Expected::TRAILER_LINE:
-  case Expected::MORE_OF_TRAILER_LINE:
-    if (c == '\r') {
-      m_expected = m_expected == Expected::TRAILER_LINE ? Expected::LAST_LINE_FEED : Expected::TRAILER_LINE_FEED;
-      return;
-    }
-    RequireText(c);
-    CountOverhead();
-    m_expected = Expected::MORE_OF_TRAILER_LINE;
-    return;
-  case Expected::TRAILER_LINE_FEED:
-  case Expected::LAST_LINE_FEED:
-    Require(c, '\n', "a carriage return without a line feed");
+  }
+  TakeSizeDigit(c, bodyLength);
+}
+
+void ChunkedBodyDecoder::TakeCharacterOfTrailer(char c) {
+  if (m_expected == Expected::TRAILER_LINE_FEED || m_expected == Expected::LAST_LINE_FEED) {
+    Require(c, '\n', NO_LINE_FEED);
     m_expected = m_expected == Expected::LAST_LINE_FEED ? Expected::NOTHING : Expected::TRAILER_LINE;
     return;
-  case Expected::DATA:
-  case Expected::NOTHING:
-    return; // not met: the one is taken in pieces, after the other nothing is taken
   }
+  if (c == '\r') {
+    m_expected = m_expected == Expected::TRAILER_LINE ? Expected::LAST_LINE_FEED : Expected::TRAILER_LINE_FEED;
+    return;
+  }
+  RequireText(c);
+  CountOverhead();
+  m_expected = Expected::MORE_OF_TRAILER_LINE;
 }
 
 void ChunkedBodyDecoder::TakeSizeDigit(char c, std::size_t bodyLength) {

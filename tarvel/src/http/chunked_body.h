@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// The chunked transfer coding, taken off.
+/// Decoding of the chunked transfer coding.
 
 #pragma once
 
@@ -10,11 +10,12 @@
 
 namespace Tarvel::Http {
 
-/// Decodes a body in the chunked coding (RFC 9112, section 7.1) piece by piece. Extensions and trailer are passed over.
+/// Decodes a body in the chunked coding (RFC 9112, section 7.1) piece by piece. Extensions and trailer are skipped.
 class ChunkedBodyDecoder {
 public:
-  /// Decodes from `bytes`, appends to `body`, and returns how many bytes were taken: all, unless the body ends before.
-  /// @throws HttpException for what is not in the chunked coding, or makes `body` longer than `MAX_BODY_BYTES`.
+  /// Decodes `bytes`, appends the result to `body`, and returns how many bytes were used: all, unless the body ends
+  /// before.
+  /// @throws HttpException when `bytes` are not in the chunked coding, or make `body` longer than `MAX_BODY_BYTES`.
   std::size_t Put(std::string_view bytes, std::string &body);
 
   bool IsComplete() const noexcept { return m_expected == Expected::NOTHING; }
@@ -36,11 +37,13 @@ private:
   };
 
   void TakeCharacter(char c, std::size_t bodyLength);
+  void TakeCharacterOfSizeLine(char c, std::size_t bodyLength);
+  void TakeCharacterOfTrailer(char c);
   void TakeSizeDigit(char c, std::size_t bodyLength);
   void CountOverhead();
 
   Expected m_expected = Expected::SIZE;
-  std::size_t m_size = 0;     // of the chunk, or what is left of it
+  std::size_t m_size = 0;     // of the chunk, or of the rest of it
   std::size_t m_overhead = 0; // bytes of extensions, trailer and leading zeros so far
 };
 

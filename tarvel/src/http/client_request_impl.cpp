@@ -2,20 +2,19 @@
 
 #include "http/client_request_impl.h"
 
-#include "core/wiped_growth.h"
-
-#include <tarvel/core/secure_wipe.h>
 #include <tarvel/core/string_util.h>
 
 #include <algorithm>
 #include <array>
+#include <cstddef>
+#include <string>
 #include <utility>
 
 namespace Tarvel::Http {
 
 namespace {
 
-/// What the user agent itself says about the message; a second voice would make the message ambiguous.
+/// Headers that the user agent sets itself; a second one of the same name would make the message ambiguous.
 constexpr std::array<std::string_view, 7> OWN_HEADERS{
     "Accept-Encoding", "Connection", "Content-Length", "Cookie", "Host", "Transfer-Encoding", "Expect"};
 
@@ -48,9 +47,10 @@ std::string SerialiseHeader(const RequestData &request, std::string_view host, s
   }
   AppendHeader(header, "Accept-Encoding", "identity");
   AppendHeader(header, "Connection", "close");
-  // RFC 9110, section 8.6: no length for a method that does not foresee a body.
-  if (!request.body.empty() || request.method == "POST" || request.method == "PUT") {
-    AppendHeader(header, "Content-Length", std::to_string(request.body.size()));
+  // RFC 9110, section 8.6: no length without a body, if the method does not normally have one.
+  const std::size_t bodyLength = request.body.Get().size();
+  if (bodyLength > 0 || request.method == "POST" || request.method == "PUT") {
+    AppendHeader(header, "Content-Length", std::to_string(bodyLength));
   }
   header.append("\r\n");
   return header;
@@ -58,25 +58,22 @@ std::string SerialiseHeader(const RequestData &request, std::string_view host, s
 
 } // namespace
 
-RequestData::~RequestData() {
-  SecureWipe(body);
-}
-
-std::string Serialise(const RequestData &request, std::string_view host, std::string_view cookies) {
+SecretText Serialise(const RequestData &request, std::string_view host, std::string_view cookies) {
   const std::string header = SerialiseHeader(request, host, cookies);
   std::string message;
-  message.reserve(header.size() + request.body.size()); // grown in between, it would leave copies of the body behind
-  message.append(header).append(request.body);
-  return message; // not what append returns, which would be copied
+  message.reserve(header.size() +
+                  request.body.Get().size()); // if it grew later, it would leave copies of the body in memory
+  message.append(header).append(request.body.Get());
+  return SecretText(std::move(message));
 }
 
 ClientRequestImpl::ClientRequestImpl(std::string_view method, std::string_view path) {
   if (!IsToken(method)) {
-    throw InvalidArgumentException("the method of an HTTP request is no token.");
+    throw InvalidArgumentException("the method of an HTTP request is not a token.");
   }
   if (path.empty() || path.front() != '/' || !std::all_of(path.begin(), path.end(), IsTargetCharacter)) {
     throw InvalidArgumentException(
-        "the path of an HTTP request does not begin with '/', or holds a blank, a fragment, a "
+        "the path of an HTTP request does not begin with '/', or contains a blank, a fragment, a "
         "control character or one that is not ASCII.");
   }
   m_data.method = std::string(method);
@@ -85,11 +82,11 @@ ClientRequestImpl::ClientRequestImpl(std::string_view method, std::string_view p
 
 void ClientRequestImpl::SetHeader(std::string_view name, std::string_view value) {
   if (!IsToken(name)) {
-    throw InvalidArgumentException("the name of an HTTP header is no token.");
+    throw InvalidArgumentException("the name of an HTTP header is not a token.");
   }
   if (!IsFieldValue(value)) {
     throw InvalidArgumentException("the value of the HTTP header " + StringUtil::Shorten(name) +
-                                   " holds a control character.");
+                                   " contains a control character.");
   }
   const auto isName = [name](std::string_view other) { return EqualsIgnoringCase(other, name); };
   if (std::any_of(OWN_HEADERS.begin(), OWN_HEADERS.end(), isName)) {
@@ -105,7 +102,7 @@ void ClientRequestImpl::SetHeader(std::string_view name, std::string_view value)
 }
 
 void ClientRequestImpl::WriteBody(std::string_view bytes) {
-  AppendWiping(m_data.body, bytes);
+  m_data.body.Append(bytes);
 }
 
 RequestData ClientRequestImpl::Take() {

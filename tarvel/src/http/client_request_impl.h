@@ -6,6 +6,7 @@
 
 #include "http/header_syntax.h"
 
+#include <tarvel/core/secret_text.h>
 #include <tarvel/http/user_agent.h>
 
 #include <string>
@@ -13,24 +14,17 @@
 
 namespace Tarvel::Http {
 
-/// A request without what depends on the connection. Its body is secret.
+/// A request without what depends on the connection.
 struct RequestData {
-  RequestData() = default;
-  RequestData(const RequestData &) = delete;
-  RequestData &operator=(const RequestData &) = delete;
-  RequestData(RequestData &&) noexcept = default;
-  RequestData &operator=(RequestData &&) = delete;
-  ~RequestData();
-
   std::string method;
   std::string target; ///< path and query
   HeaderFields headers;
-  std::string body;
+  SecretText body;
 };
 
-/// The whole message as it is sent. It is secret as the body is: the caller wipes it.
-/// @param host as in the Host header. @param cookies the Cookie header, empty for none.
-std::string Serialise(const RequestData &request, std::string_view host, std::string_view cookies);
+/// The whole message as it is sent.
+/// @param host for the Host header. @param cookies for the Cookie header; empty for none.
+SecretText Serialise(const RequestData &request, std::string_view host, std::string_view cookies);
 
 class ClientRequestImpl final : public ClientRequest {
 public:
@@ -39,7 +33,7 @@ public:
   void SetHeader(std::string_view name, std::string_view value) override;
   void WriteBody(std::string_view bytes) override;
 
-  /// Gives everything away, for the one start.
+  /// Moves everything out, for the start of the request.
   /// @throws InvalidStateException when that was done before.
   RequestData Take();
 

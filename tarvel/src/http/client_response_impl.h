@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// The one implementation of `ClientResponse`, over a response that is there as a whole.
+/// The one implementation of `ClientResponse`, for a response that has been read completely.
 
 #pragma once
 

@@ -29,7 +29,7 @@ bool IsDelimiter(char c) noexcept {
          (byte >= 0x5B && byte <= 0x60) || (byte >= 0x7B && byte <= 0x7E);
 }
 
-/// The number of `minimum` to `maximum` digits that `text` begins with and that no further digit follows; takes it off.
+/// The number that `text` begins with, if it has `minimum` to `maximum` digits; it is removed from `text`.
 std::optional<int> TakeNumber(std::string_view &text, std::size_t minimum, std::size_t maximum) {
   const auto end = std::find_if_not(text.begin(), text.end(), IsDigit);
   const auto length = static_cast<std::size_t>(end - text.begin());
@@ -44,7 +44,7 @@ std::optional<int> TakeNumber(std::string_view &text, std::size_t minimum, std::
   return number;
 }
 
-/// hh:mm:ss, with one or two digits each, and whatever after it does not begin with a digit.
+/// hh:mm:ss, with one or two digits each. Anything that does not begin with a digit may follow.
 bool TakeTime(std::string_view token, DateFields &fields) {
   const auto hour = TakeNumber(token, 1, 2);
   if (!hour || token.empty() || token.front() != ':') {
@@ -75,7 +75,7 @@ std::optional<int> FindMonth(std::string_view token) {
   return found == NAMES.end() ? std::nullopt : std::optional<int>(static_cast<int>(found - NAMES.begin()) + 1);
 }
 
-/// Gives `token` to the first field that has no value yet and that it fits, in the order of the standard.
+/// Assigns `token` to the first field without a value that it fits, in the order of the standard.
 void TakeToken(std::string_view token, DateFields &fields) {
   if (!fields.hour && TakeTime(token, fields)) {
     return;

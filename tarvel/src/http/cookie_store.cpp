@@ -2,9 +2,9 @@
 
 #include <tarvel/http/cookie_store.h>
 
+#include "core/fork_gate.h"
 #include "http/header_syntax.h"
 #include "http/set_cookie.h"
-#include "system/fork_gate.h"
 
 #include <tarvel/core/exception.h>
 #include <tarvel/core/string_util.h>
@@ -22,19 +22,19 @@ namespace Tarvel::Http {
 
 namespace {
 
-constexpr std::size_t MAX_COOKIES = 50;        // the least that RFC 6265, section 6.1, asks for within a domain
-constexpr std::size_t MAX_COOKIE_BYTES = 4096; // likewise, name and value together
+constexpr std::size_t MAX_COOKIES = 50;        // the minimum for a domain by RFC 6265, section 6.1
+constexpr std::size_t MAX_COOKIE_BYTES = 4096; // also that minimum, for name and value together
 constexpr std::int64_t MICROSECONDS = 1000000; // in a second
 
-/// Cookies go back only to the very host that set them. A Domain attribute could widen that to a whole domain, but to know
-/// that a domain is not a public suffix such as "co.uk" takes a list that has to be kept up to date; a user agent talks to
-/// one host and does not need it.
+/// A cookie is sent only to the host that set it. A Domain attribute could extend that to a whole domain, but only a
+/// list that is kept up to date can say whether a domain is a public suffix such as "co.uk". A user agent sends to one
+/// host and does not need the list.
 struct Cookie {
   std::string name;
   std::string value;
   std::string host;
   std::string path;
-  std::optional<std::int64_t> expires; // microseconds since 1970, UTC; none: as long as the store
+  std::optional<std::int64_t> expires; // microseconds since 1970, UTC; nullopt: never
   bool isSecure = false;
 };
 
@@ -93,11 +93,11 @@ public:
 private:
   ~CookieStoreImpl() override = default;
 
-  mutable System::ForkSafeMutex m_mutex;
+  mutable ForkSafeMutex m_mutex;
   std::vector<Cookie> m_cookies; // in the order of their creation
 };
 
-// Whether the connection is a secure one does not matter here (RFC 6265, section 5.3): it decides what is sent back.
+// Whether the connection is secure does not matter here (RFC 6265, section 5.3); it matters for what is sent back.
 void CookieStoreImpl::SetFromHeader(std::string_view setCookie, std::string_view host, std::string_view path, bool) {
   const std::optional<SetCookie> parsed = ParseSetCookie(setCookie);
   if (!parsed || parsed->name.size() + parsed->value.size() > MAX_COOKIE_BYTES ||
@@ -112,12 +112,12 @@ void CookieStoreImpl::SetFromHeader(std::string_view setCookie, std::string_view
                 ComputeExpiry(*parsed, now),
                 parsed->isSecure};
 
-  const std::lock_guard<System::ForkSafeMutex> lock(m_mutex);
+  const std::lock_guard<ForkSafeMutex> lock(m_mutex);
   const auto same = std::find_if(m_cookies.begin(), m_cookies.end(), [&cookie](const Cookie &other) {
     return other.name == cookie.name && other.path == cookie.path && EqualsIgnoringCase(other.host, cookie.host);
   });
   if (same != m_cookies.end()) {
-    *same = std::move(cookie); // and so keeps its place
+    *same = std::move(cookie); // the new cookie keeps the place of the old one
   } else {
     m_cookies.push_back(std::move(cookie));
   }
@@ -131,7 +131,7 @@ void CookieStoreImpl::SetFromHeader(std::string_view setCookie, std::string_view
 
 std::string CookieStoreImpl::GetHeader(std::string_view host, std::string_view path, bool isSecure) const {
   const std::int64_t now = System::GetUtcDateTime().GetUtcTime();
-  const std::lock_guard<System::ForkSafeMutex> lock(m_mutex);
+  const std::lock_guard<ForkSafeMutex> lock(m_mutex);
   std::vector<const Cookie *> toSend;
   for (const Cookie &cookie : m_cookies) {
     if (!IsExpired(cookie, now) && (isSecure || !cookie.isSecure) && EqualsIgnoringCase(cookie.host, host) &&
@@ -150,7 +150,7 @@ std::string CookieStoreImpl::GetHeader(std::string_view host, std::string_view p
 }
 
 std::size_t CookieStoreImpl::GetCount() const {
-  const std::lock_guard<System::ForkSafeMutex> lock(m_mutex);
+  const std::lock_guard<ForkSafeMutex> lock(m_mutex);
   return m_cookies.size();
 }
 

@@ -2,7 +2,7 @@
 
 #include "http/current_failure.h"
 
-#include "system/fork_gate.h"
+#include "core/fork_gate.h"
 
 #include <new>
 
@@ -14,7 +14,7 @@ std::shared_ptr<const Exception> MakeForeignFailure(const std::string &endpoint,
   return std::make_shared<InvalidStateException>("The request to " + endpoint + " failed: " + text);
 }
 
-/// May fail for lack of memory.
+/// Throws when memory runs out.
 std::shared_ptr<const Exception> CopyCurrentFailure(const std::string &endpoint) {
   try {
     throw;
@@ -32,8 +32,8 @@ std::shared_ptr<const Exception> CopyCurrentFailure(const std::string &endpoint)
 } // namespace
 
 const std::shared_ptr<const Exception> &OutOfMemory() {
-  const System::Computation computing;
-  // Never destroyed, as the threads that use it never end before the process does.
+  const Computation computing;
+  // Never destroyed, because the threads that use it run until the process ends.
   static const auto *const failure = new std::shared_ptr<const Exception>(std::make_shared<OutOfMemoryException>());
   return *failure;
 }

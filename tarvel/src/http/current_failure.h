@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// The exception that is being handled, as one that a completion can be given.
+/// The exception that is being handled, in a form that completions can be given.
 
 #pragma once
 
@@ -11,12 +11,13 @@
 
 namespace Tarvel::Http {
 
-/// The one exception that says that memory ran out. It is made at the first call, so that none is needed when it is.
+/// The exception for memory that ran out. It is made at the first call, so that later calls need no memory.
 const std::shared_ptr<const Exception> &OutOfMemory();
 
-/// Called while an exception is being handled: a `Tarvel::Exception` as its own class; `std::bad_alloc`, and whatever
-/// cannot be copied for lack of memory, as `OutOfMemory()`, which must have been called before; anything else as an
-/// InvalidStateException about the request to `endpoint`, with the foreign text.
+/// To be called while an exception is being handled. A `Tarvel::Exception` is returned in its own class. For
+/// `std::bad_alloc`, and for an exception that cannot be copied for lack of memory, `OutOfMemory()` is returned, which
+/// must have been called before. Anything else becomes an InvalidStateException about the request to `endpoint`, with
+/// the foreign text.
 std::shared_ptr<const Exception> CurrentFailure(const std::string &endpoint) noexcept;
 
 } // namespace Tarvel::Http

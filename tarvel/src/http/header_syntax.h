@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// What may appear in the header of an HTTP message (RFC 9110, section 5).
+/// What is allowed in the header of an HTTP message (RFC 9110, section 5).
 
 #pragma once
 
@@ -24,7 +24,7 @@ bool IsToken(std::string_view text) noexcept;
 /// A text without control characters, so that it cannot end a line.
 bool IsFieldValue(std::string_view text) noexcept;
 
-/// Without the blanks and tabs around it.
+/// `text` without the blanks and tabs around it.
 std::string_view TrimBlanks(std::string_view text) noexcept;
 
 } // namespace Tarvel::Http

@@ -4,11 +4,10 @@
 
 #include "http/client_response_impl.h"
 #include "http/current_failure.h"
-#include "system/uncaught_exception.h"
+#include "service/uncaught_exception.h"
 
 #include <tarvel/core/secure_wipe.h>
 #include <tarvel/core/string_util.h>
-#include <tarvel/ssl/ssl_context.h>
 
 #include <algorithm>
 #include <mutex>
@@ -45,7 +44,7 @@ std::string MakeHostHeader(const ConnectionSpec &spec, bool isSecure) {
     host += ":" + port;
   }
   if (host.empty() || !IsFieldValue(host)) {
-    throw InvalidArgumentException("the host of a connection may not stand in an HTTP header.");
+    throw InvalidArgumentException("the host of a connection is not allowed in an HTTP header.");
   }
   return host;
 }
@@ -56,11 +55,10 @@ HttpExchange::HttpExchange(const Ref<ConnectionSpec> &spec, const Ref<CookieStor
                            UserAgent::CompletionFunction completion)
     : m_spec(spec), m_cookies(cookies), m_endpoint(StringUtil::Shorten(spec->GetEndpointString())),
       m_request(std::move(request)), m_reader(m_request.method == "HEAD"), m_completion(std::move(completion)) {
-  OutOfMemory(); // made while there is memory
+  OutOfMemory(); // makes the exception while there is memory
 }
 
 HttpExchange::~HttpExchange() {
-  SecureWipe(m_message);
   SecureWipe(m_buffer.data(), m_buffer.size());
 }
 
@@ -74,13 +72,13 @@ void HttpExchange::Start() {
     if (Abandon()) {
       throw;
     }
-    return; // the specification called back before it threw: that decides
+    return; // the specification called back before it threw: that call is the outcome
   }
   bool isCancelled = false;
   {
-    const std::lock_guard<System::ForkSafeMutex> lock(m_mutex);
+    const std::lock_guard<ForkSafeMutex> lock(m_mutex);
     if (m_isFinishing || m_stream) {
-      return; // connected, or failed, already
+      return; // already connected, or failed
     }
     m_connecting = connecting;
     isCancelled = m_isCancelled;
@@ -90,10 +88,10 @@ void HttpExchange::Start() {
   }
 }
 
-/// Ends the exchange in silence, if its connect has not ended.
+/// Ends the exchange without a report, if its connect has not ended.
 bool HttpExchange::Abandon() noexcept {
   UserAgent::CompletionFunction completion; // destroyed outside the lock
-  const std::lock_guard<System::ForkSafeMutex> lock(m_mutex);
+  const std::lock_guard<ForkSafeMutex> lock(m_mutex);
   if (m_isConnectOver) {
     return false;
   }
@@ -105,7 +103,7 @@ bool HttpExchange::Abandon() noexcept {
 void HttpExchange::OnConnected(const Ref<System::Stream> &stream, const Exception *failure) {
   bool isCancelled = false;
   {
-    const std::lock_guard<System::ForkSafeMutex> lock(m_mutex);
+    const std::lock_guard<ForkSafeMutex> lock(m_mutex);
     if (std::exchange(m_isConnectOver, true)) {
       return;
     }
@@ -117,7 +115,7 @@ void HttpExchange::OnConnected(const Ref<System::Stream> &stream, const Exceptio
     Finish(nullptr, nullptr);
     return;
   }
-  Step([&] {
+  RunGuarded([&] {
     if (failure) {
       failure->Throw();
     }
@@ -129,24 +127,26 @@ void HttpExchange::OnConnected(const Ref<System::Stream> &stream, const Exceptio
   });
 }
 
-// Reading begins at once: a server may answer, and end the connection, before it has read a request that it refuses.
+// Reading begins at once: a server that refuses a request may answer, and end the connection, before it has read the
+// request.
 void HttpExchange::Send(const Ref<System::Stream> &stream) {
-  m_isSecure = dynamic_cast<Ssl::SSLStream *>(stream.get()) != nullptr;
+  m_isSecure = stream->IsSecure();
   m_message = Serialise(m_request, MakeHostHeader(*m_spec, m_isSecure),
                         m_cookies->GetHeader(m_spec->GetHost(), m_request.target, m_isSecure));
-  SecureWipe(m_request.body);
-  stream->AsyncWrite(m_message.data(), m_message.size(), [self = Ref(this)](std::size_t, const Exception *failure) {
-    self->Step([&self, failure] { self->OnWritten(failure); });
+  m_request.body = SecretText();
+  const std::string &message = m_message.Get();
+  stream->AsyncWrite(message.data(), message.size(), [self = Ref(this)](std::size_t, const Exception *failure) {
+    self->RunGuarded([&self, failure] { self->OnWritten(failure); });
   });
 }
 
-/// A write that fails does not end the exchange: the read, which ends as well then, tells more.
+/// A write that fails does not end the exchange: the read fails too, and its error is more specific.
 void HttpExchange::OnWritten(const Exception *failure) {
-  SecureWipe(m_message);
+  m_message = SecretText();
   std::shared_ptr<const Exception> writeFailure(failure ? failure->Clone() : nullptr);
   bool endWaits = false;
   {
-    const std::lock_guard<System::ForkSafeMutex> lock(m_mutex);
+    const std::lock_guard<ForkSafeMutex> lock(m_mutex);
     m_isWriteOver = true;
     m_writeFailure = std::move(writeFailure);
     endWaits = m_endWaitsForWrite;
@@ -159,7 +159,7 @@ void HttpExchange::OnWritten(const Exception *failure) {
 void HttpExchange::Read(const Ref<System::Stream> &stream) {
   stream->AsyncReadSome(m_buffer.data(), m_buffer.size(),
                         [self = Ref(this)](std::size_t count, const Exception *failure) {
-                          self->Step([&self, count, failure] { self->OnRead(count, failure); });
+                          self->RunGuarded([&self, count, failure] { self->OnRead(count, failure); });
                         });
 }
 
@@ -171,14 +171,14 @@ void HttpExchange::OnRead(std::size_t count, const Exception *failure) {
     OnEnd();
     return;
   }
-  Judge([this, count] { m_reader.Put({m_buffer.data(), count}); });
+  ParseWithContext([this, count] { m_reader.Put({m_buffer.data(), count}); });
   if (m_reader.IsComplete()) {
     FinishResponse();
     return;
   }
   Ref<System::Stream> stream;
   {
-    const std::lock_guard<System::ForkSafeMutex> lock(m_mutex);
+    const std::lock_guard<ForkSafeMutex> lock(m_mutex);
     stream = m_stream;
   }
   if (stream) {
@@ -186,11 +186,11 @@ void HttpExchange::OnRead(std::size_t count, const Exception *failure) {
   }
 }
 
-/// The system tells of a reset once: when a write was told, the read finds an orderly end. So the end counts as one, where
-/// a body ends by it, only when the write went well.
+/// The kernel reports a reset only once. If the write got it, the read sees an orderly end. So an end of the connection
+/// that delimits the body is accepted only if the write succeeded.
 void HttpExchange::OnEnd() {
   {
-    const std::lock_guard<System::ForkSafeMutex> lock(m_mutex);
+    const std::lock_guard<ForkSafeMutex> lock(m_mutex);
     if (!m_isWriteOver && m_reader.EndsWithConnection()) {
       m_endWaitsForWrite = true;
       return;
@@ -202,13 +202,13 @@ void HttpExchange::OnEnd() {
 void HttpExchange::FinishEnd() {
   std::shared_ptr<const Exception> writeFailure;
   {
-    const std::lock_guard<System::ForkSafeMutex> lock(m_mutex);
+    const std::lock_guard<ForkSafeMutex> lock(m_mutex);
     writeFailure = m_writeFailure;
   }
   if (writeFailure) {
     writeFailure->Throw();
   }
-  Judge([this] { m_reader.PutEnd(); });
+  ParseWithContext([this] { m_reader.PutEnd(); });
   FinishResponse();
 }
 
@@ -226,7 +226,7 @@ void HttpExchange::KeepCookies(const ResponseData &response) {
   }
 }
 
-void HttpExchange::Judge(const std::function<void()> &call) const {
+void HttpExchange::ParseWithContext(const std::function<void()> &call) const {
   try {
     call();
   } catch (const HttpException &exception) {
@@ -235,7 +235,7 @@ void HttpExchange::Judge(const std::function<void()> &call) const {
 }
 
 template <typename Call>
-void HttpExchange::Step(const Call &step) noexcept {
+void HttpExchange::RunGuarded(const Call &step) noexcept {
   try {
     step();
   } catch (...) {
@@ -251,13 +251,13 @@ std::shared_ptr<const Exception> HttpExchange::Cancelled() const noexcept {
   }
 }
 
-/// Neither failure nor response: the request was cancelled.
+/// Without a failure and a response, the request was cancelled.
 void HttpExchange::Finish(std::shared_ptr<const Exception> failure, const Ref<ClientResponse> &response) noexcept {
   Ref<System::Stream> stream;
   UserAgent::CompletionFunction completion;
   bool isCancelled = false;
   {
-    const std::lock_guard<System::ForkSafeMutex> lock(m_mutex);
+    const std::lock_guard<ForkSafeMutex> lock(m_mutex);
     if (std::exchange(m_isFinishing, true)) {
       return;
     }
@@ -272,9 +272,9 @@ void HttpExchange::Finish(std::shared_ptr<const Exception> failure, const Ref<Cl
     stream->Close();
   }
   Complete(completion, failure.get(), response);
-  completion = nullptr; // what it holds is gone before anybody who waits goes on
+  completion = nullptr; // releases what it captures before the waiters wake
   {
-    const std::lock_guard<System::ForkSafeMutex> lock(m_mutex);
+    const std::lock_guard<ForkSafeMutex> lock(m_mutex);
     m_failure = failure;
     m_response = response;
     m_isDone = true;
@@ -290,14 +290,14 @@ void HttpExchange::Complete(const UserAgent::CompletionFunction &completion, con
   try {
     completion(failure, response, Ref<PendingRequestItem>(this));
   } catch (...) {
-    System::LogUncaughtException("the completion function of an HTTP request");
+    Service::LogUncaughtException("the completion function of an HTTP request");
   }
 }
 
 Ref<ClientResponse> HttpExchange::Wait(std::chrono::microseconds timeout) {
   timeout = std::clamp(timeout, std::chrono::microseconds(0), MAX_TIMEOUT);
   const auto deadline = std::chrono::steady_clock::now() + timeout;
-  std::unique_lock<System::ForkSafeMutex> lock(m_mutex);
+  std::unique_lock<ForkSafeMutex> lock(m_mutex);
   if (!m_isDone && IsOfParent()) {
     throw System::NetworkException("The request to " + m_endpoint +
                                    " was under way when the process forked: its parent goes on with it");
@@ -317,7 +317,7 @@ void HttpExchange::Cancel() noexcept {
   Ref<System::ScheduledItem> connecting;
   Ref<System::Stream> stream;
   {
-    const std::lock_guard<System::ForkSafeMutex> lock(m_mutex);
+    const std::lock_guard<ForkSafeMutex> lock(m_mutex);
     if (m_isFinishing || IsOfParent()) {
       return;
     }
@@ -334,7 +334,7 @@ void HttpExchange::Cancel() noexcept {
 }
 
 bool HttpExchange::IsDone() const noexcept {
-  const std::lock_guard<System::ForkSafeMutex> lock(m_mutex);
+  const std::lock_guard<ForkSafeMutex> lock(m_mutex);
   return m_isDone || IsOfParent();
 }
 

@@ -4,10 +4,11 @@
 
 #pragma once
 
+#include "core/fork_gate.h"
 #include "http/client_request_impl.h"
 #include "http/response_reader.h"
-#include "system/fork_gate.h"
 
+#include <tarvel/core/secret_text.h>
 #include <tarvel/http/connection_spec.h>
 #include <tarvel/http/cookie_store.h>
 #include <tarvel/http/user_agent.h>
@@ -22,22 +23,23 @@
 
 namespace Tarvel::Http {
 
-/// Connects, sends and reads, each step started by the end of the one before, on the I/O threads. It keeps itself alive
-/// by the handlers that are pending.
+/// Connects, sends and reads on the I/O threads; the end of each step starts the next. Pending handlers hold references
+/// to the exchange.
 class HttpExchange final : public PendingRequestItem {
 public:
   HttpExchange(const Ref<ConnectionSpec> &spec, const Ref<CookieStore> &cookies, RequestData request,
                UserAgent::CompletionFunction completion);
 
-  /// Once. When it throws, nothing has been reported, and nothing will be.
+  /// To be called once. When it throws, the completion function has not been called and never will be.
   void Start();
 
   /// Waits, on this thread alone, until the completion function has run.
-  /// @throws System::TimeoutException after cancelling; System::NetworkException at once in a child of the process that
-  ///         started the request, unless the request was done before; otherwise what the request failed with.
+  /// @throws System::TimeoutException after the time-out, when the request has been cancelled; System::NetworkException
+  ///         at once in a child of the process that started the request, unless the request was done before; otherwise
+  ///         the exception that the request failed with.
   Ref<ClientResponse> Wait(std::chrono::microseconds timeout);
 
-  /// In a child of the process that started it, a request that was under way is over, and there is nothing to cancel.
+  /// Does nothing in a child of the process that started the request: there the request counts as done.
   void Cancel() noexcept override;
   bool IsDone() const noexcept override;
 
@@ -57,34 +59,33 @@ private:
   void FinishResponse();
   void KeepCookies(const ResponseData &response);
 
-  /// Runs one call of the reader, and says in its exception whose response it is about.
-  void Judge(const std::function<void()> &call) const;
-  /// Runs one step; whatever it throws is how the exchange ends.
+  /// Calls the reader. Its exception gets the endpoint into its message.
+  void ParseWithContext(const std::function<void()> &call) const;
+  /// Runs one step; an exception ends the exchange with that failure.
   template <typename Call>
-  void Step(const Call &step) noexcept;
+  void RunGuarded(const Call &step) noexcept;
   std::shared_ptr<const Exception> Cancelled() const noexcept;
   void Finish(std::shared_ptr<const Exception> failure, const Ref<ClientResponse> &response) noexcept;
   bool Abandon() noexcept;
   void Complete(const UserAgent::CompletionFunction &completion, const Exception *failure,
                 const Ref<ClientResponse> &response) noexcept;
 
-  /// Whether this is the copy of a parent's exchange, of which nothing more will be heard here.
-  bool IsOfParent() const noexcept { return m_generation != System::GetForkGeneration(); }
+  /// Whether this is a child's copy of its parent's exchange, which never ends here.
+  bool IsOfParent() const noexcept { return m_generation != GetForkGeneration(); }
 
-  const unsigned m_generation = System::GetForkGeneration();
+  const unsigned m_generation = GetForkGeneration();
   const Ref<ConnectionSpec> m_spec;
   const Ref<CookieStore> m_cookies;
   const std::string m_endpoint; // for messages
 
-  // For one step at a time, hence without a lock. The message stays until it is written; then it is wiped.
+  // Used by one step at a time, so without a lock. The message is kept until it is written.
   RequestData m_request;
-  std::string m_message;
+  SecretText m_message;
   std::array<char, BUFFER_BYTES> m_buffer; // as secret as the response
   ResponseReader m_reader;
   bool m_isSecure = false;
 
-  mutable System::ForkSafeMutex
-      m_mutex; // guards all that follows; never held while a handler or a completion function runs
+  mutable ForkSafeMutex m_mutex; // guards all members below; never held while a handler or a completion function runs
   std::condition_variable_any m_done;
   Ref<System::ScheduledItem> m_connecting;
   Ref<System::Stream> m_stream;
@@ -94,7 +95,7 @@ private:
   bool m_isWriteOver = false;
   bool m_endWaitsForWrite = false;
   std::shared_ptr<const Exception> m_writeFailure;
-  bool m_isFinishing = false; // the outcome stands, the completion function may be running
+  bool m_isFinishing = false; // the outcome is decided; the completion function may be running
   bool m_isDone = false;
   std::shared_ptr<const Exception> m_failure;
   Ref<ClientResponse> m_response;

@@ -23,14 +23,14 @@ using boost::beast::error_code;
 
 namespace {
 
-/// More than any server sends, and few enough that a server that sends nothing else is noticed.
+/// More than any server needs. A server that sends nothing else is refused.
 constexpr int MAX_INTERIM_RESPONSES = 16;
 
 constexpr int SWITCHING_PROTOCOLS = 101;
 constexpr int NO_CONTENT = 204;
-constexpr int INTERNAL_SERVER_ERROR = 500; // which has a body that counts: SOAP 1.1 sends its faults so
+constexpr int INTERNAL_SERVER_ERROR = 500; // its body is read, because SOAP 1.1 sends faults with this status
 
-/// A length that a server states is believed only so far; the rest comes as the bytes do.
+/// At most this much is reserved for a length that a server states; more is reserved as the bytes arrive.
 constexpr std::size_t MAX_RESERVED_BYTES = 256 * 1024;
 
 void CheckHeaderLength(std::size_t length) {
@@ -49,7 +49,7 @@ void CheckBodyLength(std::uint64_t length) {
   throw HttpException("its header is not HTTP/1.x (" + reason + ")");
 }
 
-/// What does not speak HTTP would never send the end of a header.
+/// A server of another protocol would never send the end of a header, so its first bytes are checked.
 void CheckBeginning(std::string_view header) {
   constexpr std::string_view BEGINNING = "HTTP/1.";
   const std::size_t length = std::min(header.size(), BEGINNING.size());
@@ -66,7 +66,7 @@ bool IsInterim(int status) noexcept {
   return status / 100 == 1 && status != SWITCHING_PROTOCOLS;
 }
 
-/// Whether the status says all: its body, if it has one, is not read.
+/// Whether the status is the whole answer: a body is not read.
 bool IsRefusal(int status) noexcept {
   return status / 100 != 2 && status != INTERNAL_SERVER_ERROR && !IsInterim(status);
 }
@@ -76,7 +76,7 @@ bool IsAboutBody(const error_code &error) {
          error == http::error::bad_transfer_encoding;
 }
 
-/// A status line that ends after its code lacks a blank, which Beast wants. Many servers forget it.
+/// Adds the blank after the status code that Beast requires and many servers leave out.
 void CompleteStatusLine(std::string &header) {
   constexpr std::string_view EXAMPLE = "HTTP/1.1 503";
   if (header.find("\r\n") == EXAMPLE.size()) {
@@ -86,13 +86,13 @@ void CompleteStatusLine(std::string &header) {
 
 } // namespace
 
-/// Beast's parser for the status line and the fields. It is never given a byte of the body: that part of it asserts, in
-/// builds with assertions, what a peer can make untrue.
+/// Beast's parser for the status line and the fields. It never gets a byte of the body: in builds with assertions, its
+/// body parser asserts conditions that a peer can violate.
 class ResponseHeaderParser final : public http::basic_parser<false> {
 public:
   ResponseHeaderParser() {
     header_limit(MAX_HEADER_BYTES);
-    body_limit(boost::none); // the body's length is judged where it is read
+    body_limit(boost::none); // the length is checked where the body is read
   }
 
   ResponseData &GetData() noexcept { return m_data; }
@@ -133,7 +133,8 @@ private:
   std::size_t on_chunk_body_impl(std::uint64_t, boost::beast::string_view, error_code &) override { return 0; }
   void on_finish_impl(error_code &) override {}
 
-  /// RFC 9112, section 6.1: what is not understood cannot be read, and beside a length it is an attempt to smuggle.
+  /// RFC 9112, section 6.1: a body in an unknown coding cannot be read, and a coding together with a length is an
+  /// attempt at request smuggling.
   void CheckTransferCodings() const {
     if (m_transferCodings == 0) {
       return;
@@ -164,7 +165,7 @@ ResponseReader::ResponseReader(bool answersHead)
     : m_answersHead(answersHead), m_header(std::make_unique<ResponseHeaderParser>()) {}
 
 ResponseReader::~ResponseReader() {
-  // Bytes of a body may have come with those of the header.
+  // Bytes of a body may have arrived with those of the header.
   SecureWipe(m_pendingHeader);
 }
 
@@ -174,8 +175,8 @@ void ResponseReader::Put(std::string_view bytes) {
   }
 }
 
-/// Takes all bytes, or those up to the header's end. The header is judged when it is whole, so that it does not matter how
-/// its bytes are packed.
+/// Uses all bytes, or those up to the header's end. The header is parsed when it is complete, so that the result does
+/// not depend on the pieces in which it arrives.
 std::size_t ResponseReader::PutHeader(std::string_view bytes) {
   constexpr std::string_view END = "\r\n\r\n";
   const std::size_t known = m_pendingHeader.size();
@@ -225,7 +226,7 @@ void ResponseReader::FinishHeader() {
   }
 }
 
-/// RFC 9112, section 6.3, for the statuses whose body counts.
+/// RFC 9112, section 6.3, for the statuses whose body is read.
 void ResponseReader::ChooseBody() {
   const int status = m_header->GetData().status;
   const bool isChunked = m_header->IsChunked();
@@ -248,7 +249,7 @@ void ResponseReader::ChooseBody() {
   m_stage = m_length == 0 ? Stage::COMPLETE : Stage::BODY_OF_LENGTH;
 }
 
-/// Every request says that it takes no coding. Handed on, encoded content would be taken for text.
+/// Every request says that it accepts no coding. Without this check, encoded content would be taken for text.
 void ResponseReader::CheckContentCoding() const {
   for (const auto &[name, value] : m_data.fields) {
     if (EqualsIgnoringCase(name, "Content-Encoding") && !value.empty() && !EqualsIgnoringCase(value, "identity")) {
@@ -258,7 +259,7 @@ void ResponseReader::CheckContentCoding() const {
   }
 }
 
-/// Takes all bytes, or those up to the body's end.
+/// Uses all bytes, or those up to the body's end.
 std::size_t ResponseReader::PutBody(std::string_view bytes) {
   std::string &body = m_data.body;
   if (m_stage == Stage::BODY_IN_CHUNKS) {

@@ -16,26 +16,27 @@
 
 namespace Tarvel::Http {
 
-/// Its body is secret.
+/// The body is secret, and wiped at the end. It is not a `SecretText`, because a reader gives it away as a string,
+/// without a copy of what may be 16 MiB.
 struct ResponseData {
   ResponseData() = default;
   ResponseData(const ResponseData &) = delete;
   ResponseData &operator=(const ResponseData &) = delete;
   ResponseData(ResponseData &&) noexcept = default;
-  ResponseData &operator=(ResponseData &&) noexcept = default; ///< onto one without a body, which is not wiped
+  ResponseData &operator=(ResponseData &&) noexcept = default; ///< only to one without a body, which would not be wiped
   ~ResponseData();
 
   int status = 0;
   std::string reason;
-  HeaderFields fields; ///< of the header; a trailer's are dropped
+  HeaderFields fields; ///< of the header; those of a trailer are dropped
   std::string body;
 };
 
 class ResponseHeaderParser;
 
-/// Reads the final response to one request, passing over interim ones (1xx but 101), in pieces of any size. Strict where
-/// leniency would let two parties read the same bytes differently, or take a part for the whole. A status other than 2xx
-/// and 500 says all: the response is complete with its header, whatever that says about a body. Messages of its
+/// Reads the final response to one request, in pieces of any size, and skips interim ones (1xx but 101). It is strict
+/// where leniency would let two parties read the same bytes differently, or take a part for the whole. With a status
+/// other than 2xx and 500 the response is complete after its header, whatever that says about a body. Messages of its
 /// exceptions are half sentences about the response. After an exception it must not be used again.
 class ResponseReader {
 public:
@@ -45,21 +46,21 @@ public:
   ResponseReader &operator=(const ResponseReader &) = delete;
   ~ResponseReader();
 
-  /// Takes the next bytes of the connection. What comes after the response's end is dropped: every request says that the
+  /// Takes the next bytes of the connection. Bytes after the response's end are dropped: every request says that the
   /// connection ends with its response.
   /// @throws HttpException when the bytes are not a response, contradict themselves, or are over a limit.
   void Put(std::string_view bytes);
 
-  /// The connection has ended in order, which is how a body without a length ends.
+  /// To be called at the orderly end of the connection, which is how a body without a length ends.
   /// @throws HttpException when the response is not complete then.
   void PutEnd();
 
   bool IsComplete() const noexcept { return m_stage == Stage::COMPLETE; }
 
-  /// Whether the connection's end is now what completes the response.
+  /// Whether the response is complete when the connection ends.
   bool EndsWithConnection() const noexcept { return m_stage == Stage::BODY_TO_END; }
 
-  /// What was read; once, when complete.
+  /// The response that was read. To be called once, when it is complete.
   ResponseData Take();
 
 private:
@@ -75,9 +76,9 @@ private:
   const bool m_answersHead;
   Stage m_stage = Stage::HEADER;
   std::unique_ptr<ResponseHeaderParser> m_header;
-  std::string m_pendingHeader; // of the response that is read, not of interim ones before it
+  std::string m_pendingHeader; // of the response that is being read
   int m_interimResponses = 0;
-  std::size_t m_length = 0; // of the body, when it is known
+  std::size_t m_length = 0; // of the body, if the header states it
   ChunkedBodyDecoder m_chunks;
   ResponseData m_data;
 };

@@ -22,7 +22,7 @@ std::pair<std::string_view, std::string_view> Split(std::string_view pair) {
   return {TrimBlanks(pair.substr(0, equals)), TrimBlanks(pair.substr(equals + 1))};
 }
 
-/// Takes off what stands before the next semicolon.
+/// Removes the text before the next semicolon, and that semicolon; returns the text.
 std::string_view TakePiece(std::string_view &rest) {
   const std::size_t end = std::min(rest.find(';'), rest.size());
   const std::string_view piece = rest.substr(0, end);
@@ -30,7 +30,7 @@ std::string_view TakePiece(std::string_view &rest) {
   return piece;
 }
 
-/// A number of seconds, at the nearest limit when it is beyond; none when it is no number.
+/// A number of seconds, clamped to a limit; nullopt when `text` is not a number.
 std::optional<std::int64_t> ParseMaxAge(std::string_view text) {
   const bool isNegative = !text.empty() && text.front() == '-';
   const std::string_view digits = text.substr(isNegative ? 1 : 0);
@@ -71,7 +71,7 @@ std::optional<SetCookie> ParseSetCookie(std::string_view text) {
   std::string_view rest = text;
   const std::string_view first = TakePiece(rest);
   const auto [name, value] = Split(first);
-  // What goes back to the server in a header must not end that header; a tab may stand between the pieces.
+  // Name and value are sent back in a header, which they must not end. A tab is allowed between the pieces.
   const bool isClean = IsFieldValue(name) && IsFieldValue(value);
   if (first.find('=') == std::string_view::npos || name.empty() || !isClean) {
     return std::nullopt;

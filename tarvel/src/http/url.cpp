@@ -40,7 +40,7 @@ std::string_view UpToPath(std::string_view text) {
   return text.substr(0, text.find_first_of("/?#"));
 }
 
-/// The authority as it is written: what stands between the scheme's "://" and the path, the query or the fragment.
+/// The authority as it is written: the text between the scheme's "://" and the path, the query or the fragment.
 std::string_view FindAuthority(std::string_view url) {
   constexpr std::string_view START = "://";
   const std::size_t colon = url.find(':');
@@ -50,15 +50,15 @@ std::string_view FindAuthority(std::string_view url) {
   return UpToPath(url.substr(colon + START.size()));
 }
 
-/// All that may be user information, with the "@" after it; empty for none. A password may hold what would end it, and the
-/// scheme may be missing, so it is taken to reach to the last "@".
+/// Everything that may be user information, with the "@" after it; empty when there is none. It is assumed to end at
+/// the last "@", because a password may contain characters that would end it, and the scheme may be missing.
 std::string_view FindUserInformation(std::string_view url) {
   const std::string_view upToMark = url.substr(0, url.rfind('@') + 1);
   const std::size_t slashes = upToMark.find("//");
   return slashes == std::string_view::npos ? upToMark : upToMark.substr(slashes + 2);
 }
 
-/// `url` as a message may show it: without user information, which may hold a password, on one line and not endless.
+/// `url` as a message may show it: without user information, which may contain a password, on one line and shortened.
 std::string Quote(std::string_view url) {
   std::string text(url);
   if (const std::string_view user = FindUserInformation(url); !user.empty()) {
@@ -82,11 +82,11 @@ void CheckCharacters(std::string_view url) {
     Refuse(url, "the host name is not ASCII (an internationalised name must be in its \"xn--\" form)");
   }
   if (!std::all_of(url.begin(), url.end(), IsUrlCharacter)) {
-    Refuse(url, "it holds a character that may not stand in a URL");
+    Refuse(url, "it contains a character that is not allowed in a URL");
   }
 }
 
-/// The number that `digits` are; nothing when they are empty or the number is larger than an `int`.
+/// The number in `digits`; nullopt when they are empty or the number is larger than an `int`.
 std::optional<int> ReadNumber(std::string_view digits) noexcept {
   int number = 0;
   if (std::from_chars(digits.data(), digits.data() + digits.size(), number).ec != std::errc()) {
@@ -95,7 +95,7 @@ std::optional<int> ReadNumber(std::string_view digits) noexcept {
   return number;
 }
 
-/// What is in the brackets of an address, and the range of the port, have messages of their own.
+/// Does not check the text in the brackets of an address and the range of the port, which have messages of their own.
 UriReference Parse(std::string_view url) {
   const std::optional<UriReference> parts = SplitUriReference(url);
   if (!parts || (parts->port && !ReadNumber(*parts->port))) {
@@ -115,7 +115,8 @@ bool IsSecureScheme(std::string_view url, const UriReference &parts) {
   return false;
 }
 
-/// Four numbers from 0 to 255, and nothing that the resolver would read in another way (octal, hexadecimal, fewer parts).
+/// Four decimal numbers from 0 to 255. Forms that a resolver would read differently (octal, hexadecimal, fewer parts)
+/// are not accepted.
 bool IsIPv4Address(const std::string &host) {
   in_addr address;
   return inet_pton(AF_INET, host.c_str(), &address) == 1;
@@ -124,11 +125,11 @@ bool IsIPv4Address(const std::string &host) {
 void CheckIPv6Address(std::string_view url, const std::string &host) {
   in6_addr address;
   if (inet_pton(AF_INET6, host.c_str(), &address) != 1) {
-    Refuse(url, "what stands in brackets is not an IPv6 address");
+    Refuse(url, "the text in brackets is not an IPv6 address");
   }
 }
 
-/// Why `label`, one part of a host name, is none; empty when it is.
+/// Why `label` is not a valid part of a host name; empty when it is one.
 std::string RefuseLabel(std::string_view label) {
   if (label.empty()) {
     return "the host name has an empty part";
@@ -137,7 +138,7 @@ std::string RefuseLabel(std::string_view label) {
     return "a part of the host name is longer than 63 characters";
   }
   if (!std::all_of(label.begin(), label.end(), IsHostCharacter)) {
-    return "the host name holds a character other than letters, digits, '-', '_' and '.'";
+    return "the host name contains a character other than letters, digits, '-', '_' and '.'";
   }
   return {};
 }
@@ -171,7 +172,7 @@ void CheckHostName(std::string_view url, const std::string &host) {
 
 std::string FindHost(std::string_view url, const UriReference &parts) {
   if (parts.userInformation) {
-    Refuse(url, "it holds user information");
+    Refuse(url, "it contains user information");
   }
   std::string host(parts.host.value_or(""));
   if (host.empty()) {
@@ -194,7 +195,7 @@ int FindPort(std::string_view url, const UriReference &parts, int defaultPort) {
   return port;
 }
 
-/// Path and query stay as they are written: unescaping would change what they mean.
+/// Path and query as they are written: unescaping would change their meaning.
 std::string FindPath(const UriReference &parts) {
   std::string path(parts.path.empty() ? "/" : parts.path);
   if (parts.query) {

@@ -30,12 +30,12 @@ public:
 
   void StartRequest(const Ref<ClientRequest> &request, CompletionFunction completion,
                     Ref<PendingRequestItem> &pending) override {
-    auto *const ours = dynamic_cast<ClientRequestImpl *>(request.get());
-    if (!ours) {
+    auto *const impl = dynamic_cast<ClientRequestImpl *>(request.get());
+    if (!impl) {
       throw InvalidArgumentException("the HTTP request was not made by CreateHttpRequest.");
     }
-    const auto exchange = MakeRef<HttpExchange>(m_spec, m_cookies, ours->Take(), std::move(completion));
-    pending = exchange; // before the completion function can run and look at it
+    const auto exchange = MakeRef<HttpExchange>(m_spec, m_cookies, impl->Take(), std::move(completion));
+    pending = exchange; // before the completion function can run and use it
     try {
       exchange->Start();
     } catch (...) {
@@ -48,7 +48,7 @@ public:
                       Ref<ClientResponse> &response) override {
     auto *const exchange = dynamic_cast<HttpExchange *>(pending.get());
     if (!exchange) {
-      throw InvalidArgumentException("the item to wait for is no started HTTP request.");
+      throw InvalidArgumentException("the item to wait for is not a started HTTP request.");
     }
     response = exchange->Wait(std::chrono::microseconds(timeoutMicroseconds));
   }

@@ -50,7 +50,7 @@ public:
 };
 
 int OpenForReading(const std::string &path) {
-  // A path is a C string to the system: what follows a NUL would be dropped without a word.
+  // To the system a path is a C string: what follows a NUL would be ignored silently.
   if (path.find('\0') != std::string::npos) {
     // NOLINTNEXTLINE(readability-redundant-string-cstr): the message shows the path up to its NUL.
     ThrowFor("open", path.c_str(), EINVAL);

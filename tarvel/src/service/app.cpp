@@ -2,7 +2,7 @@
 
 #include <tarvel/service/app.h>
 
-#include "system/fork_gate.h"
+#include "core/fork_gate.h"
 
 #include <memory>
 #include <mutex>
@@ -11,10 +11,6 @@
 namespace Tarvel::Service {
 
 namespace {
-
-using System::Computation;
-using System::ForkSafeMutex;
-using System::HostCall;
 
 class LogRootImpl final : public LogRoot {
 public:
@@ -25,7 +21,7 @@ public:
       m_hasSink.store(next != nullptr, std::memory_order_relaxed);
       m_sink.swap(next);
     }
-    // The earlier sink goes here, outside the lock: its own destructor may log.
+    // The earlier sink is destroyed here, outside the lock: its destructor may log.
   }
 
   void Write(const LogRecord &record) noexcept override {
@@ -38,7 +34,7 @@ public:
         (*sink)(record);
       }
     } catch (...) {
-      // A log line is never worth the operation that it tells of.
+      // A log line that fails must not fail the operation that it reports.
     }
   }
 
@@ -67,7 +63,7 @@ private:
 
 App &GetApp() {
   const Computation computing;
-  // Never destroyed: a thread may log as long as the process lives, past the end of static objects.
+  // Never destroyed: a thread may log until the process ends, after static objects have been destroyed.
   static AppImpl *const app = new AppImpl;
   return *app;
 }

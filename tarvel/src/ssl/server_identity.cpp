@@ -33,7 +33,7 @@ bool IsLowerHexDigit(char c) noexcept {
   return (c >= '0' && c <= '9') || (c >= 'a' && c <= 'f');
 }
 
-/// The 64 digits of `text` in lower case; empty when it is no thumbprint.
+/// The 64 digits of `text` in lower case; empty when it is not a thumbprint.
 std::string NormaliseThumbprint(std::string_view text) {
   const bool hasColons = text.size() == LENGTH_WITH_COLONS;
   if (!hasColons && text.size() != DIGITS) {
@@ -55,7 +55,8 @@ std::string NormaliseThumbprint(std::string_view text) {
   return digits;
 }
 
-/// The name as certificates write it: a scope says which interface of this machine, a last dot how a resolver searches.
+/// The name as it is written in certificates. They contain neither a scope, which selects an interface of this machine,
+/// nor a final dot, which is for the resolver.
 std::string NormaliseHost(std::string_view host) {
   if (host.size() > 2 && host.front() == '[' && host.back() == ']') {
     host = host.substr(1, host.size() - 2);
@@ -67,7 +68,7 @@ std::string NormaliseHost(std::string_view host) {
   std::string name;
   for (const char c : host) {
     if (c <= ' ' || c > '~') {
-      throw SSLException("the host name holds a character that is not printable ASCII");
+      throw SSLException("the host name contains a character that is not printable ASCII");
     }
     name += ToLowerAscii(c);
   }
@@ -107,7 +108,7 @@ ServerIdentity::ServerIdentity(const std::string &host, const std::string &param
                          "\" is not a SHA-256 thumbprint of 64 hexadecimal digits");
     }
   }
-  // OpenSSL takes an empty name for the wish to check none.
+  // For OpenSSL an empty name means that no name is checked.
   if (m_host.empty() && m_thumbprint.empty()) {
     throw SSLException("there is no host name to check the server's certificate against");
   }

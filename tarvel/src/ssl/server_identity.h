@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// Who the server has to be: the host name, or the thumbprint of its certificate.
+/// The identity that is required of the server: the host name, or the thumbprint of its certificate.
 
 #pragma once
 
@@ -12,30 +12,31 @@ namespace Tarvel::Ssl {
 
 class ServerIdentity {
 public:
-  /// @param host a name or an address, this with or without brackets.
-  /// @param parameter empty, or a SHA-256 thumbprint: 64 hexadecimal digits, in pairs with colons between or without.
-  /// @throws SSLException when `parameter` is any other text, or `host` is no ASCII text; the message is the reason.
+  /// @param host a name, or an address with or without brackets.
+  /// @param parameter empty, or a SHA-256 thumbprint: 64 hexadecimal digits, with or without colons between the pairs.
+  /// @throws SSLException when `parameter` is any other text, when `host` is not printable ASCII, or when both are
+  ///         empty; the message is the reason.
   ServerIdentity(const std::string &host, const std::string &parameter);
 
-  /// Sends the name, and has chain verification check it.
+  /// Sets the server name to send, and the name that the verification of the chain checks.
   /// @throws SSLException, OutOfMemoryException
   void Apply(SSL *connection) const;
 
-  /// Whether the thumbprint stands in for chain and name.
+  /// Whether the thumbprint replaces the checks of chain and name.
   bool HasThumbprint() const noexcept { return !m_thumbprint.empty(); }
 
-  /// Why `certificate`, null for none, does not have the thumbprint; empty when it has.
+  /// Why `certificate` (may be null) does not have the thumbprint; empty when it does.
   /// @throws Crypto::CryptoException, OutOfMemoryException
   std::string RefuseByThumbprint(X509 *certificate) const;
 
-  /// Two identities have the same text exactly when their checks are the same.
+  /// The text is the same for two identities exactly when their checks are the same.
   std::string ToKey() const { return m_host + '\n' + m_thumbprint; }
 
 private:
   void ApplyName(SSL *connection) const;
 
-  std::string m_host;       // lower case, without brackets, scope and the root's dot
-  std::string m_thumbprint; // lower-case digits; empty for none
+  std::string m_host;       // lower case, without brackets, scope and final dot
+  std::string m_thumbprint; // lower-case digits; empty when there is none
   bool m_isAddress = false;
 };
 

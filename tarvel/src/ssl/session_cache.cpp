@@ -2,7 +2,7 @@
 
 #include "ssl/session_cache.h"
 
-#include "crypto/openssl_use.h"
+#include "crypto/openssl_guard.h"
 
 #include <ctime>
 #include <iterator>
@@ -14,10 +14,11 @@ namespace Tarvel::Ssl {
 namespace {
 
 constexpr std::size_t MAX_SESSIONS = 512;
-/// As many connections to one endpoint may be open at once and all be resumed.
+/// So many connections to one endpoint can be open at once and all have resumed a session.
 constexpr std::size_t MAX_SESSIONS_PER_KEY = 64;
 
-/// Whether the session can be resumed, and its server's certificate, which nobody will check again, is still valid.
+/// Whether the session can be resumed and its server's certificate is still valid, which a resumed handshake does not
+/// check.
 bool IsUsable(const SSL_SESSION *session) {
   if (SSL_SESSION_is_resumable(session) != 1) {
     return false;
@@ -34,25 +35,25 @@ bool IsUsable(const SSL_SESSION *session) {
 } // namespace
 
 void SessionCache::Put(const std::string &key, SessionHandle session) {
-  const std::lock_guard<System::ForkSafeMutex> lock(m_mutex);
+  const std::lock_guard<ForkSafeMutex> lock(m_mutex);
   ForgetThoseOfParent();
   Entries entry;
   entry.push_back(Entry{key, std::move(session)});
   m_byKey.emplace(key, entry.begin());
-  m_entries.splice(m_entries.end(), entry); // in both places or, without memory, in none
+  m_entries.splice(m_entries.end(), entry); // so the session is in both containers or, without memory, in neither
   if (m_byKey.count(key) > MAX_SESSIONS_PER_KEY) {
     const auto oldest = m_byKey.lower_bound(key);
     m_entries.erase(oldest->second);
     m_byKey.erase(oldest);
   }
   if (m_entries.size() > MAX_SESSIONS) {
-    m_byKey.erase(m_byKey.lower_bound(m_entries.front().key)); // its first is the oldest of all
+    m_byKey.erase(m_byKey.lower_bound(m_entries.front().key)); // the first entry is the oldest of all
     m_entries.pop_front();
   }
 }
 
 SessionHandle SessionCache::Take(const std::string &key) {
-  const std::lock_guard<System::ForkSafeMutex> lock(m_mutex);
+  const std::lock_guard<ForkSafeMutex> lock(m_mutex);
   ForgetThoseOfParent();
   for (auto end = m_byKey.upper_bound(key); end != m_byKey.lower_bound(key); end = m_byKey.upper_bound(key)) {
     const auto newest = std::prev(end);
@@ -67,27 +68,27 @@ SessionHandle SessionCache::Take(const std::string &key) {
 }
 
 void SessionCache::Abandon() noexcept {
-  const std::lock_guard<System::ForkSafeMutex> lock(m_mutex);
+  const std::lock_guard<ForkSafeMutex> lock(m_mutex);
   for (Entry &entry : m_entries) {
-    Crypto::OpenSslUse::Abandon(entry.session.release());
+    Crypto::OpenSslGuard::Abandon(entry.session.release());
   }
 }
 
 std::size_t SessionCache::GetSize() {
-  const std::lock_guard<System::ForkSafeMutex> lock(m_mutex);
+  const std::lock_guard<ForkSafeMutex> lock(m_mutex);
   ForgetThoseOfParent();
   return m_entries.size();
 }
 
 void SessionCache::ForgetThoseOfParent() {
-  if (std::exchange(m_generation, System::GetForkGeneration()) != System::GetForkGeneration()) {
+  if (std::exchange(m_generation, GetForkGeneration()) != GetForkGeneration()) {
     m_byKey.clear();
     m_entries.clear();
   }
 }
 
 void SessionCache::Clear() {
-  const std::lock_guard<System::ForkSafeMutex> lock(m_mutex);
+  const std::lock_guard<ForkSafeMutex> lock(m_mutex);
   m_byKey.clear();
   m_entries.clear();
 }

@@ -4,8 +4,8 @@
 
 #pragma once
 
+#include "core/fork_gate.h"
 #include "ssl/ssl_handles.h"
-#include "system/fork_gate.h"
 
 #include <cstddef>
 #include <list>
@@ -14,24 +14,24 @@
 
 namespace Tarvel::Ssl {
 
-/// Recent sessions by key. The key names the endpoint and all that its certificate was checked for, since a resumed
-/// session is not checked again. Safe on any thread.
+/// Recent sessions by key. The key contains the endpoint and everything that its certificate was checked for, because a
+/// resumed session is not checked again. Safe on any thread.
 class SessionCache {
 public:
   SessionCache() = default;
   SessionCache(const SessionCache &) = delete;
   SessionCache &operator=(const SessionCache &) = delete;
 
-  /// Keeps `session`, in place of the longest unused one when there are too many.
+  /// Adds `session`. When there are too many, the oldest is removed.
   void Put(const std::string &key, SessionHandle session);
 
-  /// Takes the newest usable session out: each is used once at a time, and a ticket of TLS 1.3 once at all (RFC 8446,
-  /// appendix C.4). Null when there is none.
+  /// Removes and returns the newest usable session; null when there is none. So no two connections use a session at the
+  /// same time, and a ticket of TLS 1.3 is used only once (RFC 8446, appendix C.4).
   SessionHandle Take(const std::string &key);
 
   void Clear();
 
-  /// Forgets the sessions without freeing them, once OpenSSL is gone.
+  /// Forgets the sessions without freeing them, once OpenSSL has cleaned itself up.
   void Abandon() noexcept;
 
   std::size_t GetSize();
@@ -43,13 +43,14 @@ private:
   };
   using Entries = std::list<Entry>;
 
-  /// Under the lock: a child begins with none, for what its parent has is its parent's to use.
+  /// To be called under the lock. A child process begins with an empty cache, because only the parent uses its
+  /// sessions.
   void ForgetThoseOfParent();
 
-  mutable System::ForkSafeMutex m_mutex;                 // guards all that follows
-  unsigned m_generation = System::GetForkGeneration();   // of the process that the entries belong to
-  Entries m_entries;                                     // the oldest first
-  std::multimap<std::string, Entries::iterator> m_byKey; // within a key, the oldest first
+  mutable ForkSafeMutex m_mutex;                         // guards all members below
+  unsigned m_generation = GetForkGeneration();           // of the process that the entries belong to
+  Entries m_entries;                                     // oldest first
+  std::multimap<std::string, Entries::iterator> m_byKey; // within a key, oldest first
 };
 
 } // namespace Tarvel::Ssl

@@ -5,10 +5,11 @@
 #include "crypto/certificate_impl.h"
 #include "crypto/library_context.h"
 #include "crypto/openssl_errors.h"
-#include "crypto/openssl_use.h"
+#include "crypto/openssl_guard.h"
 #include "crypto/private_key_impl.h"
 #include "ssl/ssl_context_impl.h"
 #include "ssl/ssl_stream_impl.h"
+#include "ssl/tls_connection.h"
 #include "ssl/tls_policy.h"
 
 #include <openssl/x509v3.h>
@@ -21,7 +22,7 @@ namespace Tarvel::Ssl {
 namespace {
 
 bool Exists(const char *path) {
-  std::error_code ignored; // what cannot be looked at is not there
+  std::error_code ignored; // a path that cannot be examined counts as missing
   return std::filesystem::exists(path, ignored);
 }
 
@@ -31,11 +32,11 @@ void RequireSuccess(long result, const Crypto::OpenSslErrorScope &errors, const 
   }
 }
 
-/// OpenSSL's certificate behind `certificate`, ready to be used by many connections at once: OpenSSL decodes the
-/// extensions when they are first asked for, which is better done before there is anyone to wait for it.
+/// The OpenSSL object of `certificate`, ready for use by many connections at once: OpenSSL decodes the extensions at
+/// the first use, under a lock, so they are decoded here, before any connection could wait for that.
 X509 *Prepare(const Crypto::Certificate &certificate) {
   X509 *const native = Crypto::AsImpl(certificate).GetNative();
-  X509_check_purpose(native, -1, 0); // what it says of bad extensions, verification will say again
+  X509_check_purpose(native, -1, 0); // bad extensions are reported again by verification
   return native;
 }
 
@@ -48,8 +49,8 @@ SSLStream::~SSLStream() = default;
 SSLContext::~SSLContext() = default;
 
 SSLContextImpl::SSLContextImpl() {
-  Crypto::OpenSslUse::Prepare();
-  const Crypto::OpenSslUse use;
+  Crypto::OpenSslGuard::Prepare();
+  const Crypto::OpenSslGuard use;
   use.Require();
   const Crypto::OpenSslErrorScope errors;
   m_native.reset(SSL_CTX_new_ex(Crypto::GetLibraryContext(), nullptr, TLS_client_method()));
@@ -58,30 +59,30 @@ SSLContextImpl::SSLContextImpl() {
   }
   SSL_CTX *const native = m_native.get();
   ApplyTlsPolicy(native);
-  // Only the intermediates that were given are shown, not whatever the trust store would add to them.
+  // Only the intermediates that were given are sent; OpenSSL adds none from the trust store.
   SSL_CTX_set_mode(native, SSL_MODE_AUTO_RETRY | SSL_MODE_NO_AUTO_CHAIN);
   SSL_CTX_set_verify(native, SSL_VERIFY_PEER, nullptr);
-  SSL_CTX_set_cert_verify_callback(native, SSLStreamImpl::OnVerifyServer, nullptr);
-  // A certificate that the host trusts is trusted, also when it is not a root.
+  SSL_CTX_set_cert_verify_callback(native, TlsConnection::OnVerifyServer, nullptr);
+  // Every certificate that the host adds is a trust anchor, even if it is not a root.
   X509_VERIFY_PARAM_set_flags(SSL_CTX_get0_param(native), X509_V_FLAG_PARTIAL_CHAIN);
   SSL_CTX_set_session_cache_mode(native, SSL_SESS_CACHE_CLIENT | SSL_SESS_CACHE_NO_INTERNAL);
-  SSL_CTX_sess_set_new_cb(native, SSLStreamImpl::OnNewSession);
+  SSL_CTX_sess_set_new_cb(native, TlsConnection::OnNewSession);
 }
 
 SSLContextImpl::~SSLContextImpl() {
-  const Crypto::OpenSslUse use;
+  const Crypto::OpenSslGuard use;
   if (!use) {
     m_sessions.Abandon();
-    Crypto::OpenSslUse::Abandon(m_native.release());
+    Crypto::OpenSslGuard::Abandon(m_native.release());
     return;
   }
   m_sessions.Clear();
   m_native.reset();
 }
 
-// Not by OpenSSL's default paths: these can be bent by environment variables.
+// Does not use OpenSSL's default paths, because environment variables can change them.
 void SSLContextImpl::TrustSystemStore() {
-  const Crypto::OpenSslUse use;
+  const Crypto::OpenSslGuard use;
   use.Require();
   const Crypto::OpenSslErrorScope errors;
   const char *const file = X509_get_default_cert_file();
@@ -107,7 +108,7 @@ void SSLContextImpl::TrustFile(const std::string &path) {
 }
 
 void SSLContextImpl::TrustCertificates(const Crypto::CertificateList &certificates) {
-  const Crypto::OpenSslUse use;
+  const Crypto::OpenSslGuard use;
   use.Require();
   const Crypto::OpenSslErrorScope errors;
   m_sessions.Clear();
@@ -121,7 +122,7 @@ void SSLContextImpl::SetClientCertificate(const Ref<const Crypto::Certificate> &
                                           const Ref<const Crypto::PrivateKey> &key,
                                           const Crypto::CertificateList &intermediates) {
   Crypto::RequireKeyMatchesCertificate(*key, *certificate);
-  const Crypto::OpenSslUse use;
+  const Crypto::OpenSslGuard use;
   use.Require();
   const Crypto::OpenSslErrorScope errors;
   m_sessions.Clear();
@@ -137,7 +138,7 @@ void SSLContextImpl::SetClientCertificate(const Ref<const Crypto::Certificate> &
 }
 
 Ref<SSLStream> SSLContextImpl::CreateStream(const Ref<System::Stream> &stream, const std::string &endpoint) {
-  const Crypto::OpenSslUse use;
+  const Crypto::OpenSslGuard use;
   use.Require();
   return MakeRef<SSLStreamImpl>(Ref<SSLContextImpl>(this), stream, endpoint);
 }

@@ -13,7 +13,7 @@ namespace Tarvel::Ssl {
 
 class SSLContextImpl final : public SSLContext {
 public:
-  /// @throws as `CreateSSLContext`.
+  /// Throws the same exceptions as `CreateSSLContext`.
   SSLContextImpl();
 
   void TrustSystemStore() override;

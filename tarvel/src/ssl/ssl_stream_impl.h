@@ -1,16 +1,14 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// The one implementation of `SSLStream`: OpenSSL's protocol between two buffers in memory, and what moves the bytes
-/// between these and the stream below.
+/// The one implementation of `SSLStream`: it moves bytes between the TLS connection in memory and the stream below.
 
 #pragma once
 
+#include "core/fork_gate.h"
 #include "crypto/openssl_end.h"
-#include "crypto/openssl_errors.h"
-#include "ssl/server_identity.h"
+#include "ssl/completions.h"
 #include "ssl/ssl_context_impl.h"
-#include "ssl/ssl_handles.h"
-#include "system/fork_gate.h"
+#include "ssl/tls_connection.h"
 
 #include <tarvel/ssl/ssl_context.h>
 
@@ -32,19 +30,13 @@ public:
   void AsyncWrite(const char *bytes, std::size_t length, TransferHandler handler) override;
   void Close() noexcept override;
 
-  /// For OpenSSL: asks whether the server's certificate is good (1) or not (0).
-  static int OnVerifyServer(X509_STORE_CTX *verification, void *) noexcept;
-  /// For OpenSSL: shows each message, before it is sent.
-  static void OnMessage(int, int, int, const void *, std::size_t, SSL *, void *stream) noexcept;
-  /// For OpenSSL: offers a session for keeping; 1 when its reference was taken over.
-  static int OnNewSession(SSL *connection, SSL_SESSION *session) noexcept;
-
 private:
-  using Failure = std::shared_ptr<const Exception>;
+  using Failure = Completions::Failure;
+  using Progress = TlsConnection::Progress;
 
   enum class Stage {
     FRESH,
-    SHAKING,
+    HANDSHAKING,
     ESTABLISHED,
     FAILED ///< or closed: m_failure says why
   };
@@ -61,29 +53,27 @@ private:
     TransferHandler handler;
   };
 
-  /// Handlers whose operations have ended, to be called once the lock is released.
-  class Completions;
-
   ~SSLStreamImpl() override;
 
-  /// What went wrong below; none when nothing did.
+  /// What went wrong below; nullopt without a failure.
   using LowerFailure = std::optional<std::string>;
 
-  /// Whether this is the copy of a parent's stream: the connection is the parent's to use, and so are its handlers.
-  bool IsOfParent() const noexcept { return m_generation != System::GetForkGeneration(); }
+  /// Whether this is a child's copy of its parent's stream. Only the parent uses the connection and calls the handlers.
+  bool IsOfParent() const noexcept { return m_generation != GetForkGeneration(); }
 
   void PostPump();
-  /// Takes `step` under the lock, or fails what is pending once OpenSSL is gone; then calls the handlers. What `step` throws
-  /// ends the stream.
+  /// Runs `step` under the lock, or fails what is pending once OpenSSL is gone; then calls the handlers. An exception
+  /// from `step` ends the stream.
   template <typename Step>
   void Advance(const Step &step) noexcept;
-  /// The same on an I/O thread, on which a stream below that is not the platform's need not call back.
+  /// The same on an I/O thread. A stream below that is not the platform's may call back on another thread.
   template <typename Step>
   void AdvanceOnIoThread(Step step) noexcept;
-  /// For the end of OpenSSL. Nobody would wake a read that waits for a server that is silent.
+  /// Called when OpenSSL cleans itself up. Closes the stream below, which wakes a read that waits for a silent server.
   static void OnOpenSslEnd(void *stream) noexcept;
 
-  // All that follows is called under the lock. The steps say whether they wait for bytes from below.
+  // All functions below are called under the lock. Steps that return a bool return whether they wait for bytes from
+  // below.
   void Pump(Completions &done);
   bool StepHandshake(Completions &done);
   void StepWrite(Completions &done);
@@ -94,21 +84,15 @@ private:
   void OnLowerWritten(const LowerFailure &failure, Completions &done);
 
   void BeginHandshake(Completions &done);
-  void FinishHandshake(Completions &done);
-  std::string RefuseServer() const;
-  std::string VerifyServer(X509_STORE_CTX *verification) const;
-  void KeepSession(SessionHandle session);
   void SendClosingNotice() noexcept;
   void CompletePendingSoon() noexcept;
-  /// Frees the connection and has its sessions remembered. The stream has failed, or nobody holds it any more.
-  void EndConnection() noexcept;
 
-  /// Whether OpenSSL, whose call gave `result`, waits for bytes. If not, the stream has failed.
-  bool WaitsForBytes(int result, const Crypto::OpenSslErrorScope &errors, Completions &done);
-  /// Each of these ends the stream for good: what is pending, and what comes, fails.
+  /// Whether OpenSSL waits for bytes, after a step that is not DONE. If not, the stream has failed.
+  bool WaitsForBytes(Progress progress, Completions &done);
+  /// Each of these ends the stream for good: pending and later operations fail.
   void Fail(const std::string &reason, Completions &done) noexcept;
   void FailWith(Failure failure, Completions &done) noexcept;
-  /// The same, but what is pending is left to a later step.
+  /// The same, but a later step completes what is pending.
   void MarkFailed(Failure failure) noexcept;
   /// The same once OpenSSL is gone.
   void MarkEnded() noexcept;
@@ -116,29 +100,18 @@ private:
   Failure MakeFailureOrNoMemory(const char *reason) const noexcept;
   void FailPending(const Failure &failure, Completions &done) noexcept;
 
-  const unsigned m_generation = System::GetForkGeneration();
-  const Ref<SSLContextImpl> m_context;
+  const unsigned m_generation = GetForkGeneration();
   const Ref<System::Stream> m_lower;
-  const std::string m_endpoint;
   const Failure m_noMemory = std::make_shared<OutOfMemoryException>();
-  const Failure m_processEnds = std::make_shared<InvalidStateException>(Crypto::OpenSslUse::ENDED);
+  const Failure m_processEnds = std::make_shared<InvalidStateException>(Crypto::OpenSslGuard::ENDED);
   std::atomic<bool> m_wasResumed{false};
 
-  System::ForkSafeMutex m_mutex; // guards all that follows; never held while a handler runs
+  ForkSafeMutex m_mutex; // guards all members below; never held while a handler runs
   Stage m_stage = Stage::FRESH;
   Failure m_failure;
-  std::string m_host; // as given; the endpoint until then
+  std::string m_host; // of the handshake; the endpoint before it
   std::string m_parameter;
-  std::optional<ServerIdentity> m_identity;
-  std::string m_sessionKey;
-  std::string m_verifyFailure;
-  bool m_lacksMemory = false; // as far as it has been noticed within OpenSSL
-
-  ConnectionHandle m_connection; // used on the I/O threads alone, but for its end
-  // The oldest first. Not to be seen by others yet: the connection copies and changes its sessions, and takes no lock.
-  std::vector<SessionHandle> m_newSessions;
-  BIO *m_received = nullptr; // owned by m_connection: from below, still encrypted
-  BIO *m_toSend = nullptr;   // owned by m_connection: for below, encrypted
+  TlsConnection m_tls;
 
   HandshakeHandler m_handshake;
   std::optional<PendingRead> m_read;
@@ -147,11 +120,11 @@ private:
   bool m_lowerReads = false;
   bool m_lowerWrites = false;
   bool m_lowerEnded = false;
-  LowerFailure m_lowerWriteFailure; // since which nothing can be written
+  LowerFailure m_lowerWriteFailure; // after which nothing can be written
   std::vector<char> m_lowerInput;
   std::vector<char> m_lowerOutput;
 
-  Crypto::OpenSslEndNotice m_endNotice{OnOpenSslEnd, this}; // the last: all else must be there when it comes
+  Crypto::OpenSslEndNotice m_endNotice{OnOpenSslEnd, this}; // last: all other members must exist when it calls
 };
 
 } // namespace Tarvel::Ssl

@@ -19,8 +19,8 @@ constexpr int MIN_VERSION = TLS1_2_VERSION;
 /// 112 bits: RSA and DH from 2048 bits, curves from 224, no SHA-1 in signatures.
 constexpr int MIN_SECURITY_LEVEL = 2;
 
-/// Of TLS 1.2. A fresh key for each connection, so that whoever gets the server's key later cannot read what was recorded.
-/// Authenticated encryption comes first; CBC is there for servers that have nothing else.
+/// Of TLS 1.2. Each connection has a fresh key, so that an attacker that gets the server's key later cannot read what
+/// was recorded. Authenticated encryption comes first; CBC is for servers that offer nothing else.
 constexpr const char *CIPHERS = "ECDHE+AESGCM:ECDHE+CHACHA20:DHE+AESGCM:DHE+CHACHA20:ECDHE+AES:DHE+AES:"
                                 "!aNULL:!eNULL:!aDSS:!AESCCM:!PSK:!SRP";
 constexpr const char *CIPHERS_OF_TLS_1_3 = "TLS_AES_256_GCM_SHA384:TLS_CHACHA20_POLY1305_SHA256:TLS_AES_128_GCM_SHA256";
@@ -44,12 +44,13 @@ void Require(bool isSet, const Crypto::OpenSslErrorScope &errors, const char *fa
   }
 }
 
-/// What OpenSSL's macros do, which take the list for a text that may be changed.
+/// Does what OpenSSL's macros do; these require a list that is not constant.
 bool SetList(SSL_CTX *context, int command, std::string list) {
   return SSL_CTX_ctrl(context, command, 0, list.data()) == 1;
 }
 
-/// OpenSSL has applied the section "system_default" of whatever configuration the process has loaded to the new context.
+/// Replaces all settings, because OpenSSL has applied the section "system_default" of the process's configuration to
+/// the new context.
 void ApplyOwnPolicy(SSL_CTX *context, const Crypto::OpenSslErrorScope &errors) {
   SSL_CTX_clear_options(context, SSL_CTX_get_options(context));
   SSL_CTX_set_options(context, OPTIONS | SSL_OP_ENABLE_MIDDLEBOX_COMPAT);
@@ -57,7 +58,7 @@ void ApplyOwnPolicy(SSL_CTX *context, const Crypto::OpenSslErrorScope &errors) {
           errors, NO_VERSION);
   Require(SSL_CTX_set_cipher_list(context, CIPHERS) == 1 && SSL_CTX_set_ciphersuites(context, CIPHERS_OF_TLS_1_3) == 1,
           errors, NO_CIPHERS);
-  SSL_CTX_set_security_level(context, MIN_SECURITY_LEVEL); // after the list, which may hold one
+  SSL_CTX_set_security_level(context, MIN_SECURITY_LEVEL); // after the list of suites, which may contain a level
   Require(SetList(context, SSL_CTRL_SET_GROUPS_LIST, GROUPS), errors, "Cannot choose groups");
   Require(SetList(context, SSL_CTRL_SET_SIGALGS_LIST, SIGNATURE_ALGORITHMS) &&
               SetList(context, SSL_CTRL_SET_CLIENT_SIGALGS_LIST, SIGNATURE_ALGORITHMS),
@@ -65,7 +66,7 @@ void ApplyOwnPolicy(SSL_CTX *context, const Crypto::OpenSslErrorScope &errors) {
   SSL_CTX_set_block_padding(context, 0);
 }
 
-/// Of TLS 1.2: the suites of 1.3 are chosen apart from them.
+/// The suites of TLS 1.2; those of TLS 1.3 are chosen separately.
 std::vector<std::string> GetCipherNames(const SSL_CTX *context) {
   std::vector<std::string> names;
   const STACK_OF(SSL_CIPHER) *const ciphers = SSL_CTX_get_ciphers(context);
@@ -78,7 +79,7 @@ std::vector<std::string> GetCipherNames(const SSL_CTX *context) {
   return names;
 }
 
-/// In the machine's order.
+/// Those of the machine's suites that are also ours, in the machine's order.
 std::string KeepOurCiphers(SSL_CTX *context, const Crypto::OpenSslErrorScope &errors) {
   const std::vector<std::string> ofMachine = GetCipherNames(context);
   Require(SSL_CTX_set_cipher_list(context, CIPHERS) == 1, errors, NO_CIPHERS);
@@ -92,7 +93,7 @@ std::string KeepOurCiphers(SSL_CTX *context, const Crypto::OpenSslErrorScope &er
   return kept;
 }
 
-/// What the machine allows stays as it is where it is stricter.
+/// Keeps the machine's settings where they are stricter than ours.
 void RestrictPolicyOfMachine(SSL_CTX *context, const Crypto::OpenSslErrorScope &errors) {
   SSL_CTX_clear_options(context, UNSAFE_OPTIONS);
   SSL_CTX_set_options(context, OPTIONS);

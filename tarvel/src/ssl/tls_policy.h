@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// What TLS connections may be: versions, cipher suites, groups, signature algorithms, key sizes.
+/// What TLS connections may use: versions, cipher suites, groups, signature algorithms, key sizes.
 
 #pragma once
 
@@ -8,8 +8,8 @@
 
 namespace Tarvel::Ssl {
 
-/// Sets all of it on a new context, in place of what any configuration of the process has set there. When the machine's
-/// configuration is to count, only what that allows beyond our own rules is taken away.
+/// Sets the whole policy on a new context, in place of what any configuration of the process has set there. If the
+/// machine's configuration is in use, only what it allows beyond this library's rules is removed.
 /// @throws Crypto::CryptoException, OutOfMemoryException
 void ApplyTlsPolicy(SSL_CTX *context);
 

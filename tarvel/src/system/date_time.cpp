@@ -2,17 +2,17 @@
 
 #include <tarvel/system/date_time.h>
 
-#include "system/current_environment.h"
+#include "core/current_environment.h"
+#include "core/fork_gate.h"
 #include "system/date_time_text.h"
-#include "system/fork_gate.h"
 
 #include <algorithm>
 #include <chrono>
 #include <cstdlib>
 #include <ctime>
+#include <limits>
 
-namespace Tarvel {
-namespace System {
+namespace Tarvel::System {
 
 namespace {
 
@@ -41,7 +41,7 @@ constexpr bool IsInRange(std::int64_t value) {
   return value >= MIN_MICROSECONDS && value <= MAX_MICROSECONDS;
 }
 
-/// The clock on the wall where the value is shown, as if it were UTC.
+/// The local time at which the value is shown, as if it were UTC.
 TimePoint Shown(const DateTime &value) {
   return TimePoint(microseconds(value.GetUtcTime()) + minutes(value.GetBiasMinutes()));
 }
@@ -54,26 +54,30 @@ int YearOf(const DateTime &value) {
   return static_cast<int>(DateOf(value).year());
 }
 
-/// The whole units `Unit` that have passed, where the value is shown, since the last whole `Larger`.
+/// The number of whole `Unit`s since the last whole `Larger`, in the zone in which the value is shown.
 template <typename Unit, typename Larger>
 int UnitsInto(const DateTime &value) {
   const TimePoint shown = Shown(value);
   return static_cast<int>(floor<Unit>(shown - floor<Larger>(shown)).count());
 }
 
-/// How far the process's local zone is from UTC at that point; 0 when that is unknown or has no text.
+/// Whether the fields of that point stay within the years 1 to 9999 with this bias.
+bool CanShow(std::int64_t utcMicroseconds, std::int64_t biasMinutes) {
+  return IsInRange(utcMicroseconds + microseconds(minutes(biasMinutes)).count());
+}
+
+/// The bias of the process's local zone at that point; 0 when it is unknown or cannot be written.
 std::int32_t LocalBiasMinutes(std::int64_t utcMicroseconds) {
   const std::time_t seconds = floor<std::chrono::seconds>(microseconds(utcMicroseconds)).count();
   std::tm local{};
-  const Computation computing; // the C library has a lock of its own
+  const Computation computing; // the C library takes a lock
   if (!::localtime_r(&seconds, &local)) {
     return 0;
   }
   // Local mean times of the nineteenth century have seconds, which a bias cannot show.
   const std::int64_t bias = local.tm_gmtoff / SECONDS_PER_MINUTE;
-  const bool shows = bias >= -MAX_BIAS_MINUTES && bias <= MAX_BIAS_MINUTES &&
-                     IsInRange(utcMicroseconds + microseconds(minutes(bias)).count());
-  return shows ? static_cast<std::int32_t>(bias) : 0;
+  const bool isWritable = bias >= -MAX_BIAS_MINUTES && bias <= MAX_BIAS_MINUTES && CanShow(utcMicroseconds, bias);
+  return isWritable ? static_cast<std::int32_t>(bias) : 0;
 }
 
 void AppendDigits(std::string &text, int value, int digits) {
@@ -84,6 +88,14 @@ void AppendDigits(std::string &text, int value, int digits) {
 }
 
 } // namespace
+
+std::int64_t SecondsToMicroseconds(std::int64_t seconds) noexcept {
+  std::int64_t product = 0;
+  if (__builtin_mul_overflow(seconds, MICROSECONDS_PER_SECOND, &product)) {
+    return seconds < 0 ? std::numeric_limits<std::int64_t>::min() : std::numeric_limits<std::int64_t>::max();
+  }
+  return product;
+}
 
 DateTime::DateTime(std::string_view text) {
   const DateTimeFields fields = ParseDateTimeText(text);
@@ -101,6 +113,21 @@ DateTime::DateTime(std::string_view text) {
   }
   m_utcMicroseconds = utc;
   m_biasMinutes = fields.biasMinutes;
+}
+
+DateTime DateTime::PlusMicroseconds(std::int64_t microseconds) const noexcept {
+  std::int64_t sum = 0;
+  if (__builtin_add_overflow(m_utcMicroseconds, microseconds, &sum)) {
+    sum = microseconds < 0 ? MIN_MICROSECONDS : MAX_MICROSECONDS;
+  }
+  DateTime result;
+  result.m_utcMicroseconds = std::clamp(sum, MIN_MICROSECONDS, MAX_MICROSECONDS);
+  result.m_biasMinutes = CanShow(result.m_utcMicroseconds, m_biasMinutes) ? m_biasMinutes : 0;
+  return result;
+}
+
+DateTime DateTime::PlusSeconds(std::int64_t seconds) const noexcept {
+  return PlusMicroseconds(SecondsToMicroseconds(seconds));
 }
 
 int DateTime::GetCentury() const noexcept {
@@ -191,7 +218,9 @@ std::string FormatMessageArgument(const DateTime &value) {
   return value.ToString();
 }
 
-} // namespace System
+} // namespace Tarvel::System
+
+namespace Tarvel {
 
 std::string DatePrintFormatter::Format(const System::DateTime &value) {
   return value.ToString();

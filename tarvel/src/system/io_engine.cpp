@@ -2,9 +2,9 @@
 
 #include "system/io_engine.h"
 
+#include "core/fork_gate.h"
+#include "service/uncaught_exception.h"
 #include "system/background_thread.h"
-#include "system/fork_gate.h"
-#include "system/uncaught_exception.h"
 
 #include <tarvel/core/exception.h>
 
@@ -79,7 +79,7 @@ private:
       try {
         m_context.run();
       } catch (...) {
-        LogUncaughtException("a completion handler");
+        Service::LogUncaughtException("a completion handler");
       }
     }
   }

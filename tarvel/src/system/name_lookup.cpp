@@ -2,7 +2,7 @@
 
 #include "system/name_lookup.h"
 
-#include "system/fork_gate.h"
+#include "core/fork_gate.h"
 
 #include <tarvel/system/stream.h>
 

@@ -2,8 +2,8 @@
 
 #include "system/shared_lookup.h"
 
+#include "core/fork_gate.h"
 #include "system/endless_thread_pool.h"
-#include "system/fork_gate.h"
 
 #include <tarvel/core/string_util.h>
 #include <tarvel/system/stream.h>

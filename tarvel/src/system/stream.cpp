@@ -2,7 +2,7 @@
 
 #include <tarvel/system/stream.h>
 
-#include "system/fork_gate.h"
+#include "core/fork_gate.h"
 #include "system/tcp_client_socket.h"
 
 #include <atomic>

@@ -4,7 +4,7 @@
 
 #pragma once
 
-#include "system/fork_gate.h"
+#include "core/fork_gate.h"
 #include "system/io_engine.h"
 #include "system/name_lookup.h"
 

@@ -2,10 +2,10 @@
 
 #include <tarvel/system/thread_pool.h>
 
+#include "core/fork_gate.h"
+#include "service/uncaught_exception.h"
 #include "system/background_thread.h"
 #include "system/endless_thread_pool.h"
-#include "system/fork_gate.h"
-#include "system/uncaught_exception.h"
 
 #include <tarvel/core/exception.h>
 
@@ -108,7 +108,7 @@ public:
     try {
       m_work();
     } catch (...) {
-      LogUncaughtException("a work item of the thread pool");
+      Service::LogUncaughtException("a work item of the thread pool");
     }
     m_work = nullptr;
     m_stage = Stage::DONE;

@@ -22,7 +22,7 @@ constexpr Range NAME_START_RANGES[] = {{0xC0, 0xD6},     {0xD8, 0xF6},     {0xF8
                                        {0x37F, 0x1FFF},  {0x200C, 0x200D}, {0x2070, 0x218F}, {0x2C00, 0x2FEF},
                                        {0x3001, 0xD7FF}, {0xF900, 0xFDCF}, {0xFDF0, 0xFFFD}, {0x10000, 0xEFFFF}};
 
-// What NameChar, production 4a, has in addition above ASCII.
+// What NameChar, production 4a, adds above ASCII.
 constexpr Range NAME_MORE_RANGES[] = {{0xB7, 0xB7}, {0x300, 0x36F}, {0x203F, 0x2040}};
 
 template <std::size_t N>
@@ -31,7 +31,7 @@ bool IsIn(const Range (&ranges)[N], std::uint32_t character) noexcept {
                      [character](const Range &range) { return range.first <= character && character <= range.last; });
 }
 
-/// By byte: what nearly all names are made of.
+/// By byte: whether it is a letter, as nearly all characters of names are.
 constexpr std::array<bool, 256> IS_ASCII_LETTER = [] {
   std::array<bool, 256> letters{};
   for (unsigned letter = 0; letter < 26; ++letter) {
@@ -46,7 +46,7 @@ std::uint32_t Byte(std::string_view text, std::size_t offset) noexcept {
 
 /// The offset of the first byte above 0x7F, or `npos`.
 std::size_t FindNonAscii(std::string_view text) noexcept {
-  constexpr std::size_t BLOCK = 64; // four words side by side keep the loop short without hiding the place
+  constexpr std::size_t BLOCK = 64; // enough for a short loop, and few enough to search byte by byte
   constexpr std::uint64_t HIGH_BITS = 0x8080808080808080u;
   std::size_t offset = 0;
   for (; text.size() - offset >= BLOCK; offset += BLOCK) {
@@ -68,7 +68,7 @@ std::size_t FindNonAscii(std::string_view text) noexcept {
   return std::string_view::npos;
 }
 
-/// The length of a beginning of `text` that holds nothing but ASCII from the blank on, found by eight bytes at a time.
+/// The length of a prefix of `text` that contains only ASCII characters from the space on. Eight bytes at a time are checked.
 std::size_t CountPlainAscii(std::string_view text) noexcept {
   constexpr std::uint64_t HIGH_BITS = 0x8080808080808080;
   constexpr std::uint64_t BLANKS = 0x2020202020202020;

@@ -16,12 +16,12 @@ namespace {
 constexpr std::string_view DECLARATION_BEGIN = "<?xml";
 constexpr std::size_t FIRST_BYTES = 4; // enough to distinguish the encodings of Unicode (XML 1.0, appendix F)
 
-/// Reads the parts of an XML declaration (XML 1.0, section 2.8), which come in one order.
+/// Reads the parts of an XML declaration (XML 1.0, section 2.8), which have a fixed order.
 class DeclarationReader {
 public:
   explicit DeclarationReader(SourceCursor &cursor) : m_cursor(cursor) { m_cursor.Advance(DECLARATION_BEGIN.size()); }
 
-  /// The value of the part `name`, or nothing when another part or the end comes next.
+  /// The value of the part `name`, or nullopt if another part or the end comes next.
   std::optional<std::string_view> Read(std::string_view name) {
     m_isAfterSpace = m_cursor.SkipSpace() || m_isAfterSpace;
     if (!m_isAfterSpace || !m_cursor.Skip(name)) {
@@ -56,7 +56,7 @@ private:
   bool m_isAfterSpace = false;
 };
 
-void TakeEncoding(SourceCursor &cursor, std::string_view encoding) {
+void ApplyEncoding(SourceCursor &cursor, std::string_view encoding) {
   if (EqualsIgnoringCase(encoding, "US-ASCII")) {
     cursor.RequireAscii();
   } else if (!EqualsIgnoringCase(encoding, "UTF-8")) {
@@ -74,7 +74,7 @@ void ReadDeclaration(SourceCursor &cursor) {
     cursor.Refuse(Refusal::OTHER_VERSION, version->data(), *version);
   }
   if (const std::optional<std::string_view> encoding = declaration.Read("encoding")) {
-    TakeEncoding(cursor, *encoding);
+    ApplyEncoding(cursor, *encoding);
   }
   const std::optional<std::string_view> standalone = declaration.Read("standalone");
   if (standalone && *standalone != "yes" && *standalone != "no") {
@@ -83,9 +83,8 @@ void ReadDeclaration(SourceCursor &cursor) {
   declaration.End();
 }
 
-/// Whether the name of a target, of which "<?xml" may be the beginning only, goes on with `rest`: "<?xml-stylesheet" begins
-/// an instruction.
-bool GoesOn(std::string_view rest) noexcept {
+/// Whether a target that begins with "xml" continues in `rest`: "<?xml-stylesheet" begins an instruction, not a declaration.
+bool ContinuesTarget(std::string_view rest) noexcept {
   return !rest.empty() &&
          (IsOfClass(rest.front(), NAME) || rest.front() == ':' || static_cast<unsigned char>(rest.front()) >= 0x80);
 }
@@ -120,7 +119,7 @@ void ReadDocumentBeginning(SourceCursor &cursor) {
   if (cursor.IsAtEnd()) {
     cursor.Refuse(Refusal::EMPTY_DOCUMENT, cursor.GetPlace());
   }
-  if (cursor.IsAt(DECLARATION_BEGIN) && !GoesOn(source.substr(markLength + DECLARATION_BEGIN.size()))) {
+  if (cursor.IsAt(DECLARATION_BEGIN) && !ContinuesTarget(source.substr(markLength + DECLARATION_BEGIN.size()))) {
     ReadDeclaration(cursor);
   }
 }

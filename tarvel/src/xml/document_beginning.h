@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// What is judged before the first markup of a document: its length, its encoding and its XML declaration.
+/// What is checked before the first markup of a document: its length, its encoding and its XML declaration.
 
 #pragma once
 
@@ -9,8 +9,8 @@
 namespace Tarvel::Xml {
 
 /// Passes over a byte order mark and an XML declaration, both of which may be missing.
-/// @throws XMLParseException when the document is empty, too long, in another encoding than UTF-8 or another version than
-///         XML 1.0, or its declaration is malformed.
+/// @throws XMLParseException when the document is empty, too long, in an encoding other than UTF-8 or a version other
+///         than XML 1.0, or when its declaration is malformed.
 void ReadDocumentBeginning(SourceCursor &cursor);
 
 } // namespace Tarvel::Xml

@@ -2,7 +2,6 @@
 
 #include "xml/document_reader.h"
 
-#include "core/ascii_case.h"
 #include "xml/document_beginning.h"
 #include "xml/namespace_scope.h"
 #include "xml/references.h"
@@ -19,7 +18,6 @@ namespace {
 constexpr std::string_view COMMENT_BEGIN = "<!--";
 constexpr std::string_view CDATA_BEGIN = "<![CDATA[";
 constexpr std::string_view CDATA_END = "]]>";
-constexpr std::string_view INSTRUCTION_BEGIN = "<?";
 constexpr std::string_view INSTRUCTION_END = "?>";
 
 class DocumentReader {
@@ -45,12 +43,11 @@ private:
   void ReadText();
   void ReadComment();
   void ReadInstruction();
-  std::string_view ReadTarget();
   std::string_view ReadValue(std::string_view name);
   void ReadCData();
   const char *SkipUpTo(std::string_view delimiter, Refusal atEnd);
   void ReplaceReference();
-  void ReplaceCarriageReturn(std::string_view by);
+  void ReplaceLineEnd(std::string_view by);
   [[noreturn]] void RefuseEnd() const;
 
   void Count(const char *place);
@@ -115,7 +112,7 @@ void DocumentReader::ReadOutside() {
   ReadMarkup();
 }
 
-/// Reads what begins with the "<" that comes next.
+/// Reads the markup that begins with the next character, "<".
 void DocumentReader::ReadMarkup() {
   if (m_cursor.IsAt("</")) {
     ReadEndTag();
@@ -222,15 +219,12 @@ std::string_view DocumentReader::ReadValue(std::string_view name) {
       ReplaceReference();
       break;
     case '\r':
-      ReplaceCarriageReturn(" ");
+    case '\n':
+      ReplaceLineEnd(" ");
       break;
     case '\t':
       m_gatherer.Replace(place, place + 1, " ");
       m_cursor.Advance(1);
-      break;
-    case '\n':
-      m_gatherer.Replace(place, place + 1, " ");
-      m_cursor.SkipLineFeed();
       break;
     default:
       m_cursor.SkipCharacter();
@@ -244,7 +238,7 @@ void DocumentReader::ReadEndTag() {
     m_cursor.Refuse(Refusal::END_TAG_WITHOUT_START_TAG, tag);
   }
   m_cursor.Advance(2);
-  if (m_cursor.Skip(m_open.back().name, '>')) { // as nearly all are
+  if (m_cursor.Skip(m_open.back().name, '>')) { // nearly always
     EndElement();
     return;
   }
@@ -286,7 +280,7 @@ void DocumentReader::ReadText() {
     } else if (*place == '&') {
       ReplaceReference();
     } else if (*place == '\r') {
-      ReplaceCarriageReturn("\n");
+      ReplaceLineEnd("\n");
     } else if (m_cursor.IsAt(CDATA_END)) {
       m_cursor.Refuse(Refusal::CDATA_END_IN_TEXT, place);
     } else {
@@ -294,13 +288,13 @@ void DocumentReader::ReadText() {
     }
   }
   const std::string_view text = m_gatherer.End(m_cursor.GetPlace());
-  if (!text.empty()) { // it is when all of it is an empty CDATA section
+  if (!text.empty()) { // an empty CDATA section alone makes no text
     Count(begin);
     m_handler.Characters(text);
   }
 }
 
-/// Reads a CDATA section as a part of the text around it.
+/// Reads a CDATA section as part of the text around it.
 void DocumentReader::ReadCData() {
   const char *const begin = m_cursor.GetPlace();
   m_cursor.Advance(CDATA_BEGIN.size());
@@ -309,8 +303,8 @@ void DocumentReader::ReadCData() {
   m_gatherer.Replace(end, m_cursor.GetPlace(), "");
 }
 
-/// Passes over characters that mean no markup, line ends replaced, and over the `delimiter` that ends them.
-/// @param atEnd the reason when the document ends before. @return where the delimiter begins.
+/// Passes over characters that are not markup, replacing line ends, and over the `delimiter` that ends them.
+/// @param atEnd the refusal if the document ends before it. @return where the delimiter begins.
 const char *DocumentReader::SkipUpTo(std::string_view delimiter, Refusal atEnd) {
   for (;;) {
     m_cursor.SkipPlain<PLAIN_IN_MARKUP>();
@@ -322,7 +316,7 @@ const char *DocumentReader::SkipUpTo(std::string_view delimiter, Refusal atEnd) 
       return place;
     }
     if (*place == '\r') {
-      ReplaceCarriageReturn("\n");
+      ReplaceLineEnd("\n");
     } else {
       m_cursor.SkipCharacter();
     }
@@ -336,10 +330,10 @@ void DocumentReader::ReplaceReference() {
   m_gatherer.Replace(begin, m_cursor.GetPlace(), std::string_view(replacement, length));
 }
 
-/// Puts `by` in the place of a line end, which is CR or CR LF (XML 1.0, section 2.11).
-void DocumentReader::ReplaceCarriageReturn(std::string_view by) {
+/// Replaces a line end, which is CR, CR LF or LF (XML 1.0, section 2.11).
+void DocumentReader::ReplaceLineEnd(std::string_view by) {
   const char *const begin = m_cursor.GetPlace();
-  m_cursor.Advance(1);
+  m_cursor.Skip("\r");
   m_cursor.SkipLineFeed();
   m_gatherer.Replace(begin, m_cursor.GetPlace(), by);
 }
@@ -360,39 +354,13 @@ void DocumentReader::ReadComment() {
 
 void DocumentReader::ReadInstruction() {
   Count(m_cursor.GetPlace());
-  const std::string_view target = ReadTarget();
+  const std::string_view target = m_cursor.ReadTarget();
   if (!m_cursor.SkipSpace() && !m_cursor.IsAt(INSTRUCTION_END)) {
     m_cursor.RefuseNext(Refusal::NO_SPACE_AFTER_TARGET, Refusal::ENDS_IN_INSTRUCTION);
   }
   m_gatherer.Begin(m_cursor.GetPlace());
   const char *const end = SkipUpTo(INSTRUCTION_END, Refusal::ENDS_IN_INSTRUCTION);
   m_handler.ProcessingInstruction(target, m_gatherer.End(end));
-}
-
-/// Reads the target of a processing instruction. "xml" is reserved in any case of letters; as it is written here it begins
-/// an XML declaration that is too late.
-std::string_view DocumentReader::ReadTarget() {
-  const char *const begin = m_cursor.GetPlace();
-  m_cursor.Advance(INSTRUCTION_BEGIN.size());
-  const char *const nameBegin = m_cursor.GetPlace();
-  const bool hasName = m_cursor.SkipNcName();
-  if (m_cursor.IsAt(':')) {
-    m_cursor.Refuse(Refusal::COLON_IN_TARGET, m_cursor.GetPlace());
-  }
-  if (!hasName || m_cursor.IsAtEnd()) {
-    m_cursor.RefuseNext(Refusal::NO_TARGET, Refusal::ENDS_IN_INSTRUCTION);
-  }
-  const std::string_view target = m_cursor.GetFrom(nameBegin);
-  if (target.size() > MAX_NAME_BYTES) {
-    m_cursor.Refuse(Refusal::NAME_TOO_LONG, nameBegin);
-  }
-  if (target == "xml") {
-    m_cursor.Refuse(Refusal::LATE_DECLARATION, begin);
-  }
-  if (EqualsIgnoringCase(target, "xml")) {
-    m_cursor.Refuse(Refusal::RESERVED_TARGET, nameBegin, target);
-  }
-  return target;
 }
 
 /// Counts a node or an attribute that begins at `place`.

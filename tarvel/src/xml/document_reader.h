@@ -10,14 +10,14 @@
 
 namespace Tarvel::Xml {
 
-/// Reads a document in one pass from its beginning to its end and hands its events to `handler`, all but `StartDocument`
-/// and `TakeResult`. Never looks beyond the end of `source`. Takes time linear in the length of the document, and memory for
+/// Reads a document in one pass and passes its events to `handler`, all except `StartDocument` and `TakeResult`. Never reads
+/// beyond the end of `source`. Takes time linear in the length of the document, and memory for
 /// at most one text in which something was replaced.
-/// @param source outlives the call; texts in which nothing was replaced are given to `handler` as views of it.
-/// @throws XMLParseException for what is wrong first. What can only be judged as a whole (a name, a reference, a value, a
-///         tag) is reported where it begins, all else at the first byte that cannot be there. The length and the first four
-///         bytes are judged before the rest.
-/// @throws whatever the handler throws.
+/// @param source outlives the call; texts in which nothing was replaced are passed to `handler` as views of it.
+/// @throws XMLParseException for the first error. What can only be checked as a whole (a name, a reference, a value, a tag)
+///         is reported where it begins, everything else at the first byte that is not allowed. The length and the first four
+///         bytes are checked before the rest.
+/// @throws what the handler throws.
 void ReadDocument(std::string_view source, XMLHandler &handler);
 
 } // namespace Tarvel::Xml

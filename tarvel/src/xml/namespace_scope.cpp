@@ -7,6 +7,7 @@
 
 #include <algorithm>
 #include <array>
+#include <numeric>
 #include <tuple>
 #include <utility>
 
@@ -14,7 +15,7 @@ namespace Tarvel::Xml {
 
 namespace {
 
-// Up to this number each attribute is compared with each other; more are sorted first.
+// Up to this number, every two attributes are compared; more are sorted first.
 constexpr std::size_t FEW_ATTRIBUTES = 8;
 
 } // namespace
@@ -80,13 +81,13 @@ void NamespaceScope::CheckNames(const std::vector<AttributeEvent> &attributes) {
   }
 }
 
-// Of all pairs that must not be, the one is reported whose second attribute comes first.
+// Of all forbidden pairs, the one whose second attribute comes first is reported.
 void NamespaceScope::CheckFewNames(const std::vector<AttributeEvent> &attributes) {
-  constexpr std::size_t NOT_SOUGHT = UNKNOWN - 1;
-  std::array<std::size_t, FEW_ATTRIBUTES> namespaces; // each is sought at most once, for the declarations may be many
-  namespaces.fill(NOT_SOUGHT);
+  constexpr std::size_t NOT_LOOKED_UP = UNKNOWN - 1;
+  std::array<std::size_t, FEW_ATTRIBUTES> namespaces; // each is looked up at most once: there may be many declarations
+  namespaces.fill(NOT_LOOKED_UP);
   const auto getNamespace = [&](std::size_t index) {
-    if (namespaces[index] == NOT_SOUGHT) {
+    if (namespaces[index] == NOT_LOOKED_UP) {
       namespaces[index] = FindNamespace(attributes[index].GetPrefix());
     }
     return namespaces[index];
@@ -104,7 +105,7 @@ void NamespaceScope::CheckFewNames(const std::vector<AttributeEvent> &attributes
   }
 }
 
-/// Two attributes of one element have one name.
+/// Refuses two attributes that have the same name.
 void NamespaceScope::RefusePair(const AttributeEvent &first, const AttributeEvent &second) const {
   if (first.name == second.name) {
     m_cursor.Refuse(Refusal::ATTRIBUTE_TWICE, second.name.data(), second.name);
@@ -113,51 +114,60 @@ void NamespaceScope::RefusePair(const AttributeEvent &first, const AttributeEven
 }
 
 // Attributes of one local name are adjacent once they are sorted, and among them those of one namespace after a second
-// sorting. Of all pairs that must not be, the one is reported whose second attribute comes first.
+// sorting. Of all forbidden pairs, the one whose second attribute comes first is reported.
 void NamespaceScope::CheckManyNames(const std::vector<AttributeEvent> &attributes) {
-  std::pair<std::size_t, std::size_t> firstPair(UNKNOWN, UNKNOWN); // the second attribute, the first
-  const auto report = [&firstPair](std::size_t first, std::size_t second) {
-    firstPair = std::min(firstPair, {second, first});
-  };
-  const auto sortKey = [&attributes](std::size_t index) {
-    const AttributeEvent &attribute = attributes[index];
-    return std::make_tuple(attribute.GetLocalName(), attribute.GetPrefix(), index);
-  };
-  m_order.resize(attributes.size());
-  for (std::size_t i = 0; i < m_order.size(); ++i) {
-    m_order[i] = i;
-  }
-  std::sort(m_order.begin(), m_order.end(),
-            [&sortKey](std::size_t a, std::size_t b) { return sortKey(a) < sortKey(b); });
-
-  std::vector<std::pair<std::size_t, std::size_t>> inNamespaces; // namespace and attribute, of one local name
+  SortByName(attributes);
+  AttributePair firstPair{UNKNOWN, UNKNOWN};
   for (auto begin = m_order.begin(); begin != m_order.end();) {
     const std::string_view localName = attributes[*begin].GetLocalName();
     const auto end = std::find_if(begin, m_order.end(), [&attributes, localName](std::size_t index) {
       return attributes[index].GetLocalName() != localName;
     });
-    inNamespaces.clear();
-    for (auto next = begin; end - begin > 1 && next != end; ++next) {
-      if (next != begin && attributes[*next].name == attributes[*(next - 1)].name) {
-        report(*(next - 1), *next);
-        continue;
-      }
-      const std::size_t found = FindNamespace(attributes[*next].GetPrefix());
-      if (found != UNKNOWN) {
-        inNamespaces.emplace_back(found, *next);
-      }
-    }
-    std::sort(inNamespaces.begin(), inNamespaces.end());
-    for (std::size_t i = 1; i < inNamespaces.size(); ++i) {
-      if (inNamespaces[i - 1].first == inNamespaces[i].first) {
-        report(inNamespaces[i - 1].second, inNamespaces[i].second);
-      }
+    if (end - begin > 1) {
+      firstPair = std::min(firstPair, FindPair(attributes, begin, end));
     }
     begin = end;
   }
-  if (firstPair.first != UNKNOWN) {
-    RefusePair(attributes[firstPair.second], attributes[firstPair.first]);
+  if (firstPair.second != UNKNOWN) {
+    RefusePair(attributes[firstPair.first], attributes[firstPair.second]);
   }
+}
+
+/// Fills `m_order` with the indices of the attributes, sorted by local name, prefix and position.
+void NamespaceScope::SortByName(const std::vector<AttributeEvent> &attributes) {
+  const auto sortKey = [&attributes](std::size_t index) {
+    const AttributeEvent &attribute = attributes[index];
+    return std::make_tuple(attribute.GetLocalName(), attribute.GetPrefix(), index);
+  };
+  m_order.resize(attributes.size());
+  std::iota(m_order.begin(), m_order.end(), std::size_t{0});
+  std::sort(m_order.begin(), m_order.end(),
+            [&sortKey](std::size_t a, std::size_t b) { return sortKey(a) < sortKey(b); });
+}
+
+/// The forbidden pair whose second attribute comes first, among the attributes of one local name from `begin` to `end` in
+/// `m_order`; `UNKNOWN` twice if there is none.
+NamespaceScope::AttributePair NamespaceScope::FindPair(const std::vector<AttributeEvent> &attributes,
+                                                       OrderIterator begin, OrderIterator end) {
+  AttributePair firstPair{UNKNOWN, UNKNOWN};
+  std::vector<std::pair<std::size_t, std::size_t>> inNamespaces; // namespace and attribute
+  for (auto next = begin; next != end; ++next) {
+    if (next != begin && attributes[*next].name == attributes[*(next - 1)].name) {
+      firstPair = std::min(firstPair, {*(next - 1), *next});
+      continue;
+    }
+    const std::size_t found = FindNamespace(attributes[*next].GetPrefix());
+    if (found != UNKNOWN) {
+      inNamespaces.emplace_back(found, *next);
+    }
+  }
+  std::sort(inNamespaces.begin(), inNamespaces.end());
+  for (std::size_t i = 1; i < inNamespaces.size(); ++i) {
+    if (inNamespaces[i - 1].first == inNamespaces[i].first) {
+      firstPair = std::min(firstPair, {inNamespaces[i - 1].second, inNamespaces[i].second});
+    }
+  }
+  return firstPair;
 }
 
 /// The declaration that represents the namespace that `prefix` is bound to; `UNKNOWN` when it is empty or not bound.
@@ -173,7 +183,7 @@ std::size_t NamespaceScope::FindNamespace(std::string_view prefix) {
   return UNKNOWN;
 }
 
-// Names may be long and asked for often: they are compared once for each declaration.
+// Namespace names may be long and are needed often, so they are compared only once for each declaration.
 std::size_t NamespaceScope::FindRepresentative(std::size_t declaration) {
   std::size_t &representative = m_declarations[declaration].representative;
   if (representative == UNKNOWN) {

@@ -17,7 +17,7 @@ namespace Tarvel::Xml {
 
 namespace {
 
-// What a composed message needs: an element with a few attributes, a short text.
+// Enough for most nodes of a composed message: an element with a few attributes, a short text.
 constexpr std::size_t ELEMENT_ARENA_BYTES = 512;
 constexpr std::size_t TEXT_ARENA_BYTES = 192;
 
@@ -247,7 +247,7 @@ void ElementNode::AppendChild(Node *child) {
   if (!child || child->GetKind() == NodeKind::DOCUMENT) {
     throw InvalidArgumentException(child ? "a document cannot be a child" : "the child is null");
   }
-  // A node of an arena that is not joined with this one's cannot be above.
+  // A node whose arena is not joined with this one's cannot be an ancestor.
   if (NodeArena::AreJoined(m_arena, child->m_arena)) {
     for (const Node *node = this; node; node = node->GetParent()) {
       if (node == child) {

@@ -16,19 +16,19 @@
 
 namespace Tarvel::Xml {
 
-/// Memory that grows and is freed at once. Nodes never need destruction, so that dropping a tree costs a few frees,
-/// however large or deep it is.
+/// Memory that grows and is freed as a whole. Nodes need no destruction, so freeing a tree takes a few calls, however large
+/// or deep it is.
 ///
-/// Arenas whose trees grow together are joined: from then on they share one count of references and die together. A tree
-/// that is appended to another thereby lives as long as any reference to either, and no cycle of owners can arise. To
-/// join needs the trees for oneself; to count references does not.
+/// When a tree is appended to another, their arenas are joined: from then on they share one reference count and are freed
+/// together. So both trees live as long as any reference to either, and no cycle of owners can arise. Joining needs exclusive
+/// access to both trees; counting references does not.
 class NodeArena {
 public:
   enum class AfterUse : std::uint8_t { FREE, WIPE_AND_FREE };
 
-  /// An arena without references. Whoever makes the first node in it takes the first reference by a `Ref` to that node.
-  /// @param firstBytes room that is there from the beginning.
-  /// @param afterUse whether the memory is overwritten before it is freed, for what may be secret.
+  /// An arena without references. The caller takes the first one, with a `Ref` to the first node.
+  /// @param firstBytes the memory to allocate with the arena.
+  /// @param afterUse whether the memory is overwritten before it is freed, because it may contain secrets.
   static NodeArena *Create(std::size_t firstBytes, AfterUse afterUse = AfterUse::FREE);
 
   NodeArena(const NodeArena &) = delete;
@@ -51,7 +51,7 @@ public:
   /// A copy of the name as written: the local name, after prefix and colon where there is a prefix.
   std::string_view CopyQualifiedName(std::string_view prefix, std::string_view localName);
 
-  /// From now on the memory is overwritten before it is freed.
+  /// Makes the arena overwrite its memory before it is freed.
   void WipeAfterUse() noexcept { m_afterUse = AfterUse::WIPE_AND_FREE; }
 
   /// Keeps `object`, which views of this arena's nodes point into, for as long as the arena lives.
@@ -67,7 +67,7 @@ private:
 
   struct Block {
     Block *next;
-    std::size_t bytes; // behind this header
+    std::size_t bytes; // after this header
   };
 
   NodeArena(std::size_t firstBytes, AfterUse afterUse) noexcept;
@@ -87,8 +87,8 @@ private:
   char *AllocateBlock(std::size_t size);
   void FreeAll() noexcept;
 
-  /// The arena that holds the count of all that are joined with this one. Joining always puts the smaller group below the
-  /// larger, so that the way is no longer than the logarithm of their number and need not be shortened by readers.
+  /// The arena that has the reference count of all arenas joined with this one. Joining always puts the smaller group below
+  /// the larger, so the path to it is at most logarithmic in their number, and readers need not shorten it.
   NodeArena *GetLeader() noexcept {
     NodeArena *arena = this;
     while (arena->m_leader) {

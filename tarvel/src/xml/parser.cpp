@@ -5,7 +5,7 @@
 #include "xml/document_reader.h"
 #include "xml/tree_builder.h"
 
-#include <tarvel/core/secure_wipe.h>
+#include <tarvel/core/secret_text.h>
 
 #include <string>
 #include <utility>
@@ -14,16 +14,14 @@ namespace Tarvel::Xml {
 
 namespace {
 
-/// The text of a document, kept where it is for as long as views into it are used. It may hold a bearer token, and is
-/// overwritten.
+/// The text of a document, which may contain a bearer token. It does not move while views of it are in use.
 class SourceText final : public Object {
 public:
   explicit SourceText(std::string &&text) noexcept : m_text(std::move(text)) {}
-  ~SourceText() override { SecureWipe(m_text); }
-  std::string_view Get() const noexcept { return m_text; }
+  std::string_view Get() const noexcept { return m_text.Get(); }
 
 private:
-  std::string m_text;
+  const SecretText m_text;
 };
 
 class XMLParserImpl final : public XMLParser {

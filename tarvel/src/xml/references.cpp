@@ -30,7 +30,7 @@ std::uint32_t GetDigit(char c) noexcept {
   return lower >= 'a' && lower <= 'f' ? static_cast<std::uint32_t>(lower - 'a') + 10 : NO_DIGIT;
 }
 
-/// Reads digits; a number that no character has stays one.
+/// Reads digits. A number beyond all characters stays beyond them, however many digits follow.
 std::uint32_t ReadNumber(SourceCursor &cursor, std::uint32_t base) {
   constexpr std::uint32_t NO_CHARACTERS_FROM = 0x110000;
   if (cursor.IsAtEnd() || GetDigit(cursor.Peek()) >= base) {

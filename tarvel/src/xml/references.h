@@ -10,10 +10,10 @@
 
 namespace Tarvel::Xml {
 
-/// Reads the reference that the "&" that comes next begins.
+/// Reads the reference that begins with the next character, "&".
 /// @param replacement receives the character as UTF-8, which is never longer than the reference. @return its length.
-/// @throws XMLParseException when it is malformed, or refers to an entity that would have to be declared or to what is not
-///         a character of XML.
+/// @throws XMLParseException when it is malformed, or refers to an undefined entity or to something that is not an XML
+///         character.
 std::size_t ReadReference(SourceCursor &cursor, char (&replacement)[4]);
 
 } // namespace Tarvel::Xml

@@ -15,7 +15,7 @@ namespace {
 constexpr std::size_t NPOS = std::string_view::npos;
 constexpr std::string_view UTF8_MARK = "\xEF\xBB\xBF";
 
-/// Puts what was found in the place of `marker`, on one line: a namespace name may have any character by a reference.
+/// Replaces `marker` by what was found, on one line: by references, a namespace name may contain any character.
 void FillIn(std::string &text, std::string_view marker, std::string_view found) {
   const std::size_t place = text.find(marker);
   if (place != NPOS) {

@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// Why a document is refused: each reason and its text, which stays the same.
+/// The reasons for refusing a document, each with its text, which does not change between versions.
 
 #pragma once
 

@@ -2,6 +2,7 @@
 
 #include "xml/source_cursor.h"
 
+#include "core/ascii_case.h"
 #include "xml/characters.h"
 
 #include <tarvel/xml/parser.h>
@@ -70,6 +71,31 @@ WrittenName SourceCursor::ReadName(Refusal atEnd) {
     Refuse(Refusal::NAME_TOO_LONG, begin);
   }
   return name;
+}
+
+// A target "xml" in lower case is an XML declaration that is too late; in other letter cases the name is reserved.
+std::string_view SourceCursor::ReadTarget() {
+  const char *const begin = m_next;
+  Advance(INSTRUCTION_BEGIN.size());
+  const char *const nameBegin = m_next;
+  const bool hasName = SkipNcName();
+  if (IsAt(':')) {
+    Refuse(Refusal::COLON_IN_TARGET, m_next);
+  }
+  if (!hasName || IsAtEnd()) {
+    RefuseNext(Refusal::NO_TARGET, Refusal::ENDS_IN_INSTRUCTION);
+  }
+  const std::string_view target = GetFrom(nameBegin);
+  if (target.size() > MAX_NAME_BYTES) {
+    Refuse(Refusal::NAME_TOO_LONG, nameBegin);
+  }
+  if (target == "xml") {
+    Refuse(Refusal::LATE_DECLARATION, begin);
+  }
+  if (EqualsIgnoringCase(target, "xml")) {
+    Refuse(Refusal::RESERVED_TARGET, nameBegin, target);
+  }
+  return target;
 }
 
 void SourceCursor::RefuseNext(Refusal refusal, Refusal atEnd, std::string_view found) {

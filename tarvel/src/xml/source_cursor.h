@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// `SourceCursor`, the place in the text of a document that a reader has come to.
+/// `SourceCursor`, the position of a reader in the text of a document.
 
 #pragma once
 
@@ -16,8 +16,8 @@
 
 namespace Tarvel::Xml {
 
-/// What an ASCII character can be, as bits. Only white space and the characters of names belong to the grammar; a plain
-/// character is one that its surroundings pass over without a look at it.
+/// Classes of ASCII characters, as bits. The first three are from the grammar. A plain character is one that has no meaning
+/// in its context and can be skipped.
 enum CharacterClass : std::uint8_t {
   SPACE = 1,            // S, production 3
   NAME_START = 2,       // NameStartChar without the colon
@@ -50,10 +50,10 @@ constexpr bool IsOfClass(char character, CharacterClass characterClass) noexcept
   return (CHARACTER_CLASSES[static_cast<unsigned char>(character)] & characterClass) != 0;
 }
 
-// Most of a text is plain, so that is found out for many bytes at once.
+// Most of a text is plain, so 16 bytes at a time are checked.
 using Block = signed char __attribute__((vector_size(16)));
 
-/// Whether each byte of `block` may not be plain, which control characters and what is not ASCII never are.
+/// For each byte of `block`, whether it may not be plain. Control characters and bytes beyond ASCII never are.
 template <CharacterClass PLAIN>
 inline Block FindDoubtfulBytes(Block block) noexcept {
   auto found = block < ' '; // bytes are signed here
@@ -68,6 +68,8 @@ inline Block FindDoubtfulBytes(Block block) noexcept {
   return found;
 }
 
+constexpr std::string_view INSTRUCTION_BEGIN = "<?";
+
 /// A name as written, and where its prefix ends.
 struct WrittenName {
   std::string_view text;
@@ -77,7 +79,7 @@ struct WrittenName {
   std::string_view GetLocalName() const noexcept { return prefixLength ? text.substr(prefixLength + 1) : text; }
 };
 
-/// Never looks at the end of the text or beyond it.
+/// A position in a text, whose end is never read.
 class SourceCursor {
 public:
   /// @param source outlives the cursor.
@@ -87,7 +89,7 @@ public:
 
   bool IsAtEnd() const noexcept { return m_next == m_end; }
 
-  /// The byte to come. Must not be called at the end.
+  /// The next byte. Must not be called at the end.
   char Peek() const noexcept { return *m_next; }
   bool IsAt(char byte) const noexcept { return m_next != m_end && *m_next == byte; }
   bool IsAt(std::string_view literal) const noexcept {
@@ -140,8 +142,7 @@ public:
     return isHere;
   }
 
-  /// Passes over the plain characters of a class that come next, many at a time, and over line feeds where they mean no more
-  /// than these.
+  /// Passes over the plain characters that come next, many at a time, and outside attribute values over line feeds.
   template <CharacterClass PLAIN>
   void SkipPlain() noexcept {
     const char *next = m_next;
@@ -172,8 +173,8 @@ public:
     return m_next != begin;
   }
 
-  /// Passes over one character, which is not at the end, and which need not be ASCII.
-  /// @throws XMLParseException when it is not UTF-8, is not what the declared encoding has, or is one that XML cannot carry.
+  /// Passes over one character, which need not be ASCII. Must not be called at the end.
+  /// @throws XMLParseException when it is not UTF-8, does not exist in the declared encoding, or cannot be carried by XML.
   void SkipCharacter() {
     const unsigned char byte = static_cast<unsigned char>(*m_next);
     if (byte >= 0x20 && byte < 0x80) {
@@ -183,7 +184,7 @@ public:
     }
   }
 
-  /// From here on only ASCII is accepted, because the document is declared to be that.
+  /// From here on only ASCII is accepted, because the document declares it.
   void RequireAscii() noexcept { m_isAscii = true; }
 
   /// Passes over a name without a colon. @return whether one comes next.
@@ -196,17 +197,22 @@ public:
   }
 
   /// Passes over a name with at most one colon, which is between two names. @return an empty name when none comes next.
-  /// @param atEnd the reason when the document ends after the colon.
+  /// @param atEnd the refusal if the document ends after the colon.
   /// @throws XMLParseException when it has other colons or is too long.
   WrittenName ReadName(Refusal atEnd);
 
-  /// What comes next is not what must come, for that reason; or what comes next is the end, for the other.
+  /// Passes over `INSTRUCTION_BEGIN`, which comes next, and the target of the processing instruction. @return the target.
+  /// @throws XMLParseException when it is missing, too long, has a colon or is "xml" in any letter case.
+  std::string_view ReadTarget();
+
+  /// Refuses what comes next, for the reason `refusal`, or `atEnd` if the text ends here.
   [[noreturn]] void RefuseNext(Refusal refusal, Refusal atEnd, std::string_view found = {});
   [[noreturn]] void Refuse(Refusal refusal, const char *place, std::string_view found = {},
                            std::string_view alsoFound = {}) const;
 
 private:
-  /// The first byte at `next` or after it that may not be plain, one of the eight before it, or one of the last of the text.
+  /// The first byte from `next` on that may not be plain, or one up to seven bytes before it, or the beginning of the last
+  /// bytes, which fill no block.
   template <CharacterClass PLAIN>
   const char *SkipPlainBlocks(const char *next) const noexcept {
     constexpr bool IS_FIRST_BYTE_LOWEST = std::endian::native == std::endian::little;
@@ -231,7 +237,7 @@ private:
     m_lineBegin = place;
   }
 
-  /// Passes over those that are ASCII.
+  /// Passes over the characters of a name that are ASCII.
   void SkipNameCharacters() noexcept {
     const char *next = m_next;
     while (m_end - next >= 4 && IsOfClass(next[0], NAME) && IsOfClass(next[1], NAME) && IsOfClass(next[2], NAME) &&

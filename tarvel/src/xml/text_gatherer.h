@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// `TextGatherer`, which puts a text together of what its source has and what replaces parts of it.
+/// `TextGatherer`, which assembles a text from parts of its source and their replacements.
 
 #pragma once
 
@@ -13,9 +13,9 @@
 
 namespace Tarvel::Xml {
 
-/// A text in which nothing was replaced is a view of the source. What replaces a part of the source is never longer than
-/// that part, so that one buffer as long as the rest of the source, made when it is first needed, has room for all texts
-/// that are in use at one time.
+/// A text without replacements is a view of the source. A replacement is never longer than the part that it replaces. So one
+/// buffer as long as the rest of the source, allocated when it is first needed, is large enough for all texts that are in
+/// use at one time.
 class TextGatherer {
 public:
   /// @param sourceEnd the end of the source that all texts are from.
@@ -30,14 +30,13 @@ public:
     m_text = m_free;
   }
 
-  /// In place of the source from `begin` to `end`, which are after all that was replaced before, the text has `by`, which is
-  /// at most as long.
+  /// Replaces the source from `begin` to `end`, after all earlier replacements, by `by`, which is at most as long.
   void Replace(const char *begin, const char *end, std::string_view by) {
     Gather(begin, by);
     m_pieceBegin = end;
   }
 
-  /// The text up to `place` of the source; it is valid until the next `Clear`.
+  /// Ends the text at `place` of the source. It is valid until the next `Clear`.
   std::string_view End(const char *place) {
     if (m_free == m_text) {
       return std::string_view(m_pieceBegin, static_cast<std::size_t>(place - m_pieceBegin));
@@ -46,7 +45,7 @@ public:
     return std::string_view(m_text, static_cast<std::size_t>(m_free - m_text));
   }
 
-  /// Overwrites all texts, which may be part of a bearer token, and frees their place.
+  /// Overwrites all texts, which may be part of a bearer token, and reuses their memory.
   void Clear() noexcept {
     if (m_free != m_buffer.get()) {
       SecureWipe(m_buffer.get(), static_cast<std::size_t>(m_free - m_buffer.get()));
@@ -67,10 +66,10 @@ private:
   void Append(std::string_view text) noexcept { m_free = std::copy(text.begin(), text.end(), m_free); }
 
   const char *m_sourceEnd;
-  const char *m_pieceBegin = nullptr; // of what is not gathered yet
+  const char *m_pieceBegin = nullptr; // where the source begins that is not copied yet
   std::unique_ptr<char[]> m_buffer;
-  char *m_free = nullptr; // after all texts
-  char *m_text = nullptr; // the current text begins there
+  char *m_free = nullptr; // the end of all texts
+  char *m_text = nullptr; // the beginning of the current text
 };
 
 } // namespace Tarvel::Xml

@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// `TreeBuilder`, the handler that makes a `Document` of what a parser reads.
+/// `TreeBuilder`, the handler that builds a `Document`.
 
 #pragma once
 
@@ -11,7 +11,7 @@
 
 namespace Tarvel::Xml {
 
-/// Texts that lie in the document's source are used where they are; the others are copied into the arena of the tree.
+/// Texts that are part of the document's source stay views of it; the others are copied into the arena of the tree.
 class TreeBuilder final : public XMLHandler {
 public:
   void StartDocument(std::string_view source, const Ref<Object> &owner) override;

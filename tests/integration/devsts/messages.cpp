@@ -12,7 +12,7 @@ namespace DevStsTest {
 
 namespace {
 
-Tarvel::System::Environment Ahead(std::chrono::seconds ahead) {
+Tarvel::Environment Ahead(std::chrono::seconds ahead) {
   return {[ahead] {
             const auto now = std::chrono::system_clock::now() + ahead;
             return std::chrono::duration_cast<std::chrono::microseconds>(now.time_since_epoch()).count();

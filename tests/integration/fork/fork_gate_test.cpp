@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 
-#include "system/fork_gate.h"
+#include "core/fork_gate.h"
 
 #include "support/forked.h"
 #include "support/process_resources.h"

@@ -1,11 +1,11 @@
 // SPDX-License-Identifier: Apache-2.0
 // Functions of the host that the platform calls: fork waits for none of them, for they may wait for the thread that forks.
 
+#include "core/fork_gate.h"
 #include "support/data_file.h"
 #include "support/forked.h"
 #include "support/posting_server.h"
 #include "support/rendezvous.h"
-#include "system/fork_gate.h"
 
 #include <ssoclient/connection_spec.h>
 #include <tarvel/core/exception.h>
@@ -41,7 +41,7 @@ TEST(ForkBesideTheHostsCode, DoesNotWaitForALogSink) {
   const Ref<Service::LogRoot> root = Service::GetApp().GetRootLogger();
   root->SetSink([&gate](const Service::LogRecord &) { gate.Pass(); });
   std::thread logging([&root] {
-    const System::Computation computing; // as when the platform itself logs
+    const Computation computing; // as when the platform itself logs
     root->Write(Service::LogRecord{});
   });
   ExpectForkWhileHeldAt(gate);

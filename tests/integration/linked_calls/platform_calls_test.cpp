@@ -1,9 +1,10 @@
 // SPDX-License-Identifier: Apache-2.0
 // Checks the values with which the library calls the platform and its own factories, where no caller can see them.
-#include "exchange/response_extractors.h"
+
 #include "support/parsed_document.h"
 #include "support/throws_message.h"
 #include "transport/https_client.h"
+#include "xml/xml_text.h"
 
 #include <ssoclient/connection_spec.h>
 #include <tarvel/http/user_agent.h>

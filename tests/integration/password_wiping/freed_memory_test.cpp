@@ -5,13 +5,13 @@
 #include "exchange/request_builder_impl.h"
 #include "exchange/soap_response.h"
 #include "integration/transport/service_stand_in.h"
-#include "service/wiped_text.h"
 #include "support/identity.h"
 #include "support/rendezvous.h"
 #include "support/service_stand_ins.h"
-#include "xml/parse_xml.h"
+#include "xml/xml_text.h"
 
 #include <tarvel/core/exception.h>
+#include <tarvel/core/secret_text.h>
 #include <tarvel/core/secure_wipe.h>
 #include <tarvel/xml/parser.h>
 
@@ -207,8 +207,8 @@ TEST_P(FreedMemory, ContainsTheWipedRequestBeforeTheResponseIsRead) {
 TEST_P(FreedMemory, ContainsNoTextThatWasKeptAsASecret) {
   const std::string password = GetParam();
   const Watch watch(GetParam());
-  auto text = std::make_unique<WipedText>(password);
-  auto copy = std::make_unique<WipedText>(*text);
+  auto text = std::make_unique<Tarvel::SecretText>(password);
+  auto copy = std::make_unique<Tarvel::SecretText>(*text);
   text.reset();
   EXPECT_EQ(copy->Get(), password);
   copy.reset();
@@ -253,7 +253,7 @@ int CountFindsOfPosts(const char *secret, const Testing::ScriptedServer::Script 
 
 TEST_P(FreedMemory, ContainsNoPasswordOfARequestThatWasSent) {
   const auto answer = [](Testing::ServerConnection &connection) {
-    connection.ShakeHands();
+    connection.Handshake();
     connection.Write(Testing::Response("200 OK", "<answer/>"));
     connection.WaitForInterrupt();
   };
@@ -264,7 +264,7 @@ TEST_P(FreedMemory, ContainsNoPasswordOfARequestThatWasSent) {
 TEST_P(FreedMemory, ContainsNoPasswordOfARequestThatFailed) {
   constexpr std::int64_t SHORT = 200000; // microseconds
   const auto stall = [](Testing::ServerConnection &connection) {
-    connection.ShakeHands();
+    connection.Handshake();
     connection.WaitForInterrupt();
   };
   const auto reset = [](Testing::ServerConnection &connection) { connection.Reset(); };
@@ -281,7 +281,7 @@ enum class Reading { NOT, IN_PIECES, WHOLE, AS_XML };
 int CountFindsOfAnswers(const char *secret, const std::vector<std::string> &pieces,
                         const std::optional<Testing::TlsSettings> &tls, Reading reading) {
   const auto script = [&pieces](Testing::ServerConnection &connection) {
-    connection.ShakeHands();
+    connection.Handshake();
     connection.ReadRequest();
     for (const std::string &piece : pieces) {
       connection.Write(piece);

@@ -184,9 +184,9 @@ TEST_F(ServiceOverTls, ReportsACertificateThatTheServiceDoesNotKnow) {
   const auto context = TrustingContext();
   SecurityTokenServiceConfig config = ConfigFor(*context, "", RunningService().GetUrl());
   config.holderOfKeyConfig = HolderIdentity();
-  EXPECT_THROWS_MESSAGE(CreateSecurityTokenService(config)->AcquireTokenByCertificate(SpecFor(60)),
-                        InvalidCredentialsException,
-                        "Authentication failed: the certificate is none that the service's authority gave a client");
+  EXPECT_THROWS_MESSAGE(
+      CreateSecurityTokenService(config)->AcquireTokenByCertificate(SpecFor(60)), InvalidCredentialsException,
+      "Authentication failed: the certificate is not a client certificate of the service's authority");
 }
 
 TEST_F(ServiceOverTls, ReportsARenewalOfATokenThatIsNotRenewable) {
@@ -203,7 +203,7 @@ TEST_F(ServiceOverTls, ReportsTheDelegationOfATokenThatIsNotDelegable) {
 
 TEST_F(ServiceOverTls, ReportsThatATamperedTokenIsNotExchangedOrRenewed) {
   const TokenPtr held = m_client->AcquireToken(ALICE, PASSWORD, FullSpec());
-  const char message[] = "Authentication failed: the token's signature is not this service's";
+  const char message[] = "Authentication failed: the token is not signed by this service";
   EXPECT_THROWS_MESSAGE(m_client->AcquireTokenByToken(Tampered(*held), SpecFor(60)), InvalidCredentialsException,
                         message);
   EXPECT_THROWS_MESSAGE(m_client->RenewToken(Tampered(*held), 60), InvalidCredentialsException, message);

@@ -7,7 +7,7 @@
 #include "support/identity.h"
 #include "support/sample_requests.h"
 #include "support/token_stand_in.h"
-#include "xml/parse_xml.h"
+#include "xml/xml_text.h"
 
 #include <ssoclient/create_saml_token.h>
 #include <tarvel/xml/document.h>

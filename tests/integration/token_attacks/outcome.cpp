@@ -4,7 +4,7 @@
 
 #include "support/data_file.h"
 #include "support/facts_of.h"
-#include "xml/parse_xml.h"
+#include "xml/xml_text.h"
 
 #include <ssoclient/create_saml_token.h>
 #include <ssoclient/exceptions.h>

@@ -5,7 +5,7 @@
 #include "exchange/soap_response.h"
 #include "integration/transport/service_stand_in.h"
 #include "support/throws_message.h"
-#include "xml/node_text.h"
+#include "xml/xml_text.h"
 
 #include <tarvel/core/exception.h>
 #include <tarvel/http/url.h>
@@ -92,7 +92,7 @@ TEST(HttpsSession, PostsAndReadsLargeMessagesOverTls) {
   const std::string large(3 * 1024 * 1024, 'x');
   ServiceStandIn service(
       [&](ServerConnection &connection) {
-        connection.ShakeHands();
+        connection.Handshake();
         const std::string request = connection.ReadRequest();
         connection.Write(Response("200 OK", request.substr(request.find("\r\n\r\n") + 4)));
       },
@@ -106,7 +106,7 @@ TEST(HttpsSession, LetsNothingIntoTheHeaderThroughTheAction) {
   request.soapAction = "a\"\r\nX-Evil: 1";
   Ref<Tarvel::Reader> response;
   EXPECT_THROWS_MESSAGE(service.CreateSession()->SendRequest(request, response), Tarvel::InvalidArgumentException,
-                        "Invalid argument : the value of the HTTP header SOAPAction holds a control character.");
+                        "Invalid argument : the value of the HTTP header SOAPAction contains a control character.");
   EXPECT_EQ(service.GetServer().GetConnectionCount(), 0);
 }
 
@@ -278,7 +278,7 @@ public:
   explicit CookieService(std::vector<std::string> setCookies, bool tls = false)
       : m_service(
             [this, setCookies](ServerConnection &connection) {
-              if (connection.ShakeHands()) {
+              if (connection.Handshake()) {
                 Note(connection.ReadRequest());
                 std::string fields;
                 for (const std::string &cookie : setCookies) {

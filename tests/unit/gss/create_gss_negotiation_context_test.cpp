@@ -2,6 +2,7 @@
 
 #include "support/identity.h"
 #include "support/posting_server.h"
+#include "support/reporting_ssl_context.h"
 #include "support/soap_responses.h"
 #include "support/throws_message.h"
 
@@ -27,7 +28,7 @@ TokenSpec Spec() {
   return spec;
 }
 
-TEST(CreateGssNegotiationContext, MakesAContextThatNegotiatesOverTlsAfterTheConfigurationIsGone) {
+TEST(CreateGssNegotiationContext, MakesAContextThatNegotiatesOverTlsAfterTheConfigurationIsDestroyed) {
   const Testing::PostingServer server({Testing::IntermediateLeg("ctx", "AQID"),
                                        Testing::FinalLeg("ctx", "BAUG", Testing::ReadDataFile("tokens/bearer.xml"))},
                                       Testing::TlsSettings());
@@ -46,7 +47,33 @@ TEST(CreateGssNegotiationContext, MakesAContextThatNegotiatesOverTlsAfterTheConf
   EXPECT_NE(last.token, nullptr);
 }
 
-TEST(CreateGssNegotiationContext, GivesTheHolderOfKeyIdentityToTheRequests) {
+TEST(CreateGssNegotiationContext, KeepsTheSslContextThatItsCallerReleases) {
+  const Testing::PostingServer server({Testing::IntermediateLeg("ctx", "AQID")}, Testing::TlsSettings());
+  std::shared_ptr<GssNegotiationContext> context;
+  {
+    const auto tls = Testing::ContextThatTrustsTheTestAuthority();
+    SecurityTokenServiceConfig config = ConfigFor(server.GetUrl());
+    config.sslContext = tls.get();
+    context = CreateGssNegotiationContext(config, Spec());
+  }
+  EXPECT_EQ(*context->NegotiateToken({7}).serverLeg, (Bytes{1, 2, 3}));
+}
+
+TEST(CreateGssNegotiationContext, ReleasesTheSslContextWhenTheNegotiationIsDestroyed) {
+  const auto isDestroyed = std::make_shared<bool>(false);
+  std::shared_ptr<GssNegotiationContext> context;
+  {
+    const auto tls = Tarvel::MakeRef<Testing::ReportingSslContext>(isDestroyed);
+    SecurityTokenServiceConfig config = ConfigFor("https://localhost/");
+    config.sslContext = tls.get();
+    context = CreateGssNegotiationContext(config, Spec());
+  }
+  EXPECT_FALSE(*isDestroyed);
+  context.reset();
+  EXPECT_TRUE(*isDestroyed);
+}
+
+TEST(CreateGssNegotiationContext, SignsRequestsWithTheHolderOfKeyIdentity) {
   const Testing::PostingServer server(
       {Testing::IntermediateLeg("ctx", "AQID"), Testing::IntermediateLeg("ctx", "AQID")});
   SecurityTokenServiceConfig config = ConfigFor(server.GetUrl());
@@ -64,7 +91,7 @@ TEST(CreateGssNegotiationContext, RefusesAConfigurationWithoutTrustedCertificate
                         "Invalid argument : No STS trusted certificates provided");
 }
 
-TEST(CreateGssNegotiationContext, RefusesHttpsWithoutAContextAndAnAddressThatIsNone) {
+TEST(CreateGssNegotiationContext, RefusesHttpsWithoutAContextAndAnAddressThatIsNotValid) {
   EXPECT_THROWS_MESSAGE(CreateGssNegotiationContext(ConfigFor("https://localhost/"), Spec()),
                         Tarvel::InvalidArgumentException,
                         "Invalid argument : HTTPS connection requested but no SSLContext provided.");

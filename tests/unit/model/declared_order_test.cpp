@@ -1,5 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
-// The declared order of virtual functions and of fields: what callers were compiled against, and what braces initialise.
+// The declared order of virtual functions and of fields, on which compiled callers and braced initialisers rely.
 #include "support/declared_order.h"
 
 #include <ssoclient/exceptions.h>
@@ -10,7 +10,10 @@
 
 #include <gtest/gtest.h>
 
+#include <set>
+#include <string>
 #include <type_traits>
+#include <utility>
 #include <vector>
 
 namespace {
@@ -19,7 +22,7 @@ using namespace SsoClient;
 using Testing::AreInOrder;
 using Testing::SlotOf;
 
-/// `Class` with one more virtual function, whose slot is the number of those that it had.
+/// `Class` with one more virtual function. Its slot is the number of virtual functions of `Class`.
 template <typename Class>
 class WithOneMore : public Class {
 public:
@@ -28,6 +31,10 @@ public:
 protected:
   ~WithOneMore() = default;
 };
+
+/// The virtual one of the overloads of a name.
+template <typename Value>
+using Sets = void (SamlToken::*)(Value &) const;
 
 TEST(DeclaredOrder, SlotsOfSamlToken) {
   const std::vector<std::size_t> slots{SlotOf(&SamlToken::GetId),
@@ -38,11 +45,11 @@ TEST(DeclaredOrder, SlotsOfSamlToken) {
                                        SlotOf(&SamlToken::IsDelegable),
                                        SlotOf(&SamlToken::IsSolution),
                                        SlotOf(&SamlToken::GetConfirmationMethod),
-                                       SlotOf(&SamlToken::GetFullName),
-                                       SlotOf(&SamlToken::GetGroups),
-                                       SlotOf(&SamlToken::GetDelegationChain),
-                                       SlotOf(&SamlToken::GetAudience),
-                                       SlotOf(&SamlToken::GetAdvice),
+                                       SlotOf<Sets<std::pair<std::string, std::string>>>(&SamlToken::GetFullName),
+                                       SlotOf<Sets<std::vector<PrincipalId>>>(&SamlToken::GetGroups),
+                                       SlotOf<Sets<std::vector<Delegate>>>(&SamlToken::GetDelegationChain),
+                                       SlotOf<Sets<std::set<std::string>>>(&SamlToken::GetAudience),
+                                       SlotOf<Sets<std::vector<Advice>>>(&SamlToken::GetAdvice),
                                        SlotOf(&SamlToken::GetConfirmationCertificate),
                                        SlotOf(&SamlToken::ToXml),
                                        SlotOf(&WithOneMore<SamlToken>::OneMore)};

@@ -54,6 +54,23 @@ TYPED_TEST(ExceptionClass, CloneOfABaseReferenceKeepsTheDynamicClassAndTheMessag
   EXPECT_EQ(copy.GetBacktrace(), original.GetBacktrace());
 }
 
+TYPED_TEST(ExceptionClass, CopyOfABaseReferenceOwnsAnObjectOfTheDynamicClass) {
+  static_assert(std::is_same_v<decltype(std::declval<const TypeParam &>().Copy()), std::unique_ptr<Exception>>);
+  std::unique_ptr<Exception> copy;
+  std::string message;
+  {
+    const TypeParam original("detail");
+    const Exception &held = original;
+    message = original.what();
+    copy = held.Copy();
+    EXPECT_NE(copy.get(), &held);
+    EXPECT_EQ(copy->GetBacktrace(), original.GetBacktrace());
+  }
+  const Exception &kept = *copy;
+  EXPECT_TRUE(typeid(kept) == typeid(TypeParam));
+  EXPECT_EQ(kept.what(), message);
+}
+
 TYPED_TEST(ExceptionClass, ThrowOfABaseReferenceRaisesTheDynamicClass) {
   const TypeParam original("detail");
   const Exception &held = original;

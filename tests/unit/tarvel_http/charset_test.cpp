@@ -9,7 +9,7 @@
 namespace Tarvel::Http {
 namespace {
 
-TEST(FindCharset, ReadsTheParameterInAnyWayOfWritingIt) {
+TEST(FindCharset, ReadsTheParameterInEachOfItsForms) {
   for (const char *const contentType :
        {"text/xml;charset=ISO-8859-1", "text/xml; charset=ISO-8859-1", "text/xml ; CharSet=\"ISO-8859-1\"",
         "text/xml;version=1;charset=ISO-8859-1;x=y", "text/xml;a=\"b;charset=wrong\";charset=ISO-8859-1",
@@ -20,7 +20,7 @@ TEST(FindCharset, ReadsTheParameterInAnyWayOfWritingIt) {
   }
 }
 
-TEST(FindCharset, FindsNoneWhereNoCharsetIsNamed) {
+TEST(FindCharset, ReturnsAnEmptyTextWithoutTheNameOfACharset) {
   for (const std::string &contentType :
        {std::string(), std::string("text/xml"), std::string("text/xml;"), std::string("text/xml;charset"),
         std::string("text/xml;charset="), std::string("text/xml;charset=\"\""), std::string("text/xml;charset=a b"),
@@ -32,7 +32,7 @@ TEST(FindCharset, FindsNoneWhereNoCharsetIsNamed) {
   EXPECT_EQ(FindCharset("text/xml;charset=" + std::string(40, 'a')), std::string(40, 'a'));
 }
 
-TEST(FindCharset, TakesWhatThereIsOfAQuotedStringWithoutEnd) {
+TEST(FindCharset, ReadsAQuotedStringWithoutEnd) {
   EXPECT_EQ(FindCharset("text/xml;charset=\"utf-8"), "utf-8");
   EXPECT_EQ(FindCharset("text/xml;charset=\""), "");
   EXPECT_EQ(FindCharset("text/xml;charset=\"\\"), "");
@@ -43,14 +43,14 @@ std::string Recoded(std::string body, const std::string &charset) {
   return body;
 }
 
-TEST(RecodeToUtf8, MakesUtf8OfLatin1UnderEachOfItsNames) {
+TEST(RecodeToUtf8, ConvertsLatin1UnderEachOfItsNames) {
   for (const char *const name : {"ISO-8859-1", "iso-8859-1", "ISO_8859-1", "ISO_8859-1:1987", "iso-ir-100", "Latin1",
                                  "l1", "IBM819", "cp819", "csISOLatin1"}) {
     EXPECT_EQ(Recoded("<a>\xFC</a>", name), "<a>\xC3\xBC</a>") << name;
   }
 }
 
-TEST(RecodeToUtf8, RecodesEachByte) {
+TEST(RecodeToUtf8, ConvertsEachByte) {
   std::string latin1;
   std::string utf8;
   for (int byte = 0; byte < 256; ++byte) {
@@ -62,26 +62,26 @@ TEST(RecodeToUtf8, RecodesEachByte) {
   EXPECT_EQ(Recoded(latin1, "ISO-8859-1"), utf8);
 }
 
-TEST(RecodeToUtf8, RecodesWhatIsBeforeTheDeclaredEncoding) {
+TEST(RecodeToUtf8, ConvertsTheTextBeforeTheDeclaredEncoding) {
   EXPECT_EQ(Recoded("<?xml \xE1='1' encoding='latin1'?><a>\xFC</a>", "ISO-8859-1"),
             "<?xml \xC3\xA1='1' encoding='UTF-8'?><a>\xC3\xBC</a>");
 }
 
-TEST(RecodeToUtf8, LeavesUtf8AsItIs) {
+TEST(RecodeToUtf8, LeavesUtf8Unchanged) {
   const std::string utf8 = "<?xml version='1.0' encoding='ISO-8859-1'?><a>\xC3\xBC</a>";
   EXPECT_EQ(Recoded(utf8, "ISO-8859-1"), utf8);
   EXPECT_EQ(Recoded("", "ISO-8859-1"), "");
   EXPECT_EQ(Recoded("<a/>", "ISO-8859-1"), "<a/>");
 }
 
-TEST(RecodeToUtf8, LeavesABodyOfAnyOtherCharsetAsItIs) {
+TEST(RecodeToUtf8, LeavesABodyOfAnyOtherCharsetUnchanged) {
   const std::string body = "<?xml version='1.0' encoding='ISO-8859-1'?><a>\xFC</a>";
   for (const char *const name : {"", "utf-8", "us-ascii", "windows-1252", "ISO-8859-15", "ISO-8859-2", "latin2"}) {
     EXPECT_EQ(Recoded(body, name), body) << name;
   }
 }
 
-TEST(RecodeToUtf8, LetsADeclarationOfTheSameCharsetNameUtf8) {
+TEST(RecodeToUtf8, ReplacesTheSameCharsetInTheXmlDeclaration) {
   const std::string rest = "?><a encoding=\"latin1\">\xFC</a>";
   const std::string utf8 = "?><a encoding=\"latin1\">\xC3\xBC</a>";
   for (const char *const start :
@@ -104,7 +104,7 @@ TEST(RecodeToUtf8, LetsADeclarationOfTheSameCharsetNameUtf8) {
   }
 }
 
-TEST(RecodeToUtf8, LeavesADeclarationOfAnotherEncodingAndWhatIsNoDeclaration) {
+TEST(RecodeToUtf8, LeavesADeclarationOfAnotherEncodingAndABrokenOne) {
   for (const char *const start :
        {"<?xml version=\"1.0\" encoding=\"windows-1252\"?>", "<?xml version=\"1.0\"?>", "<?xml encoding=\"latin1\"",
         "<?xml encoding=latin1?>", "<?xml encoding=\"latin1'?>", "<?xml encoding?>", "<?xml encoding", "<?xml",

@@ -14,16 +14,15 @@ namespace Tarvel::Http {
 namespace {
 
 const std::string BAD_PATH =
-    "Invalid argument : the path of an HTTP request does not begin with '/', or holds a blank, a "
+    "Invalid argument : the path of an HTTP request does not begin with '/', or contains a blank, a "
     "fragment, a control character or one that is not ASCII.";
 
 std::string SerialiseRequest(const Ref<ClientRequest> &request, const std::string &cookies = "") {
-  return Serialise(dynamic_cast<ClientRequestImpl &>(*request).Take(), "sts.example", cookies);
+  return Serialise(dynamic_cast<ClientRequestImpl &>(*request).Take(), "sts.example", cookies).Get();
 }
 
-TEST(ClientRequest, IsSerialisedWithAllThatTheMessageNeeds) {
-  Ref<ClientRequest> request;
-  CreateHttpRequest("POST", "/STS?a=b", request);
+TEST(ClientRequest, IsSerialisedAsACompleteMessage) {
+  const Ref<ClientRequest> request = CreateHttpRequest("POST", "/STS?a=b");
   request->SetHeader("Content-Type", "text/xml");
   request->SetHeader("SOAPAction", "\"a\"");
   request->WriteBody("<env");
@@ -42,20 +41,17 @@ TEST(ClientRequest, IsSerialisedWithAllThatTheMessageNeeds) {
 }
 
 TEST(ClientRequest, StatesALengthOfZeroForAnEmptyPost) {
-  Ref<ClientRequest> request;
-  CreateHttpRequest("POST", "/", request);
+  const Ref<ClientRequest> request = CreateHttpRequest("POST", "/");
   EXPECT_NE(SerialiseRequest(request).find("\r\nContent-Length: 0\r\n\r\n"), std::string::npos);
 }
 
-TEST(ClientRequest, StatesNoLengthWhereNoBodyIsForeseen) {
-  Ref<ClientRequest> request;
-  CreateHttpRequest("GET", "/", request);
+TEST(ClientRequest, StatesNoLengthForAMethodWithoutABody) {
+  const Ref<ClientRequest> request = CreateHttpRequest("GET", "/");
   EXPECT_EQ(SerialiseRequest(request).find("Content-Length"), std::string::npos);
 }
 
-TEST(ClientRequest, LetsALaterHeaderReplaceAnEarlierOneInAnyLetterCase) {
-  Ref<ClientRequest> request;
-  CreateHttpRequest("GET", "/", request);
+TEST(ClientRequest, ReplacesAnEarlierHeaderOfTheSameNameInAnyLetterCase) {
+  const Ref<ClientRequest> request = CreateHttpRequest("GET", "/");
   request->SetHeader("X-One", "1");
   request->SetHeader("user-agent", "mine");
   request->SetHeader("x-one", "2");
@@ -64,25 +60,23 @@ TEST(ClientRequest, LetsALaterHeaderReplaceAnEarlierOneInAnyLetterCase) {
   EXPECT_EQ(message.find("User-Agent"), std::string::npos) << message;
 }
 
-TEST(ClientRequest, LetsNoHeaderEndItsLine) {
-  Ref<ClientRequest> request;
-  CreateHttpRequest("POST", "/", request);
+TEST(ClientRequest, RefusesAHeaderThatWouldEndItsLine) {
+  const Ref<ClientRequest> request = CreateHttpRequest("POST", "/");
   for (const std::string &value :
        {std::string("a\r\nX-Evil: 1"), std::string("a\rb"), std::string("a\nb"), std::string("a\tb"),
         std::string("a\0b", 3), std::string("a\x7F"), std::string("\x1B[2J")}) {
     EXPECT_THROWS_MESSAGE(request->SetHeader("SOAPAction", value), InvalidArgumentException,
-                          "Invalid argument : the value of the HTTP header SOAPAction holds a control character.");
+                          "Invalid argument : the value of the HTTP header SOAPAction contains a control character.");
   }
   for (const std::string &name : {std::string(), std::string("A B"), std::string("A:"), std::string("A\r\nB"),
                                   std::string("A\0", 2), std::string("\xC3\xBC"), std::string("A(")}) {
     EXPECT_THROWS_MESSAGE(request->SetHeader(name, "x"), InvalidArgumentException,
-                          "Invalid argument : the name of an HTTP header is no token.");
+                          "Invalid argument : the name of an HTTP header is not a token.");
   }
 }
 
-TEST(ClientRequest, LeavesTheMessagesOwnHeadersToTheUserAgent) {
-  Ref<ClientRequest> request;
-  CreateHttpRequest("POST", "/", request);
+TEST(ClientRequest, RefusesHeadersThatTheUserAgentSets) {
+  const Ref<ClientRequest> request = CreateHttpRequest("POST", "/");
   for (const std::string name :
        {"Host", "content-length", "Transfer-Encoding", "Connection", "Cookie", "Accept-Encoding", "Expect"}) {
     EXPECT_THROWS_MESSAGE(request->SetHeader(name, "x"), InvalidArgumentException,
@@ -90,14 +84,13 @@ TEST(ClientRequest, LeavesTheMessagesOwnHeadersToTheUserAgent) {
   }
 }
 
-TEST(ClientRequest, HasOneStart) {
-  Ref<ClientRequest> request;
-  CreateHttpRequest("POST", "/", request);
+TEST(ClientRequest, CanBeStartedOnlyOnce) {
+  const Ref<ClientRequest> request = CreateHttpRequest("POST", "/");
   SerialiseRequest(request);
   EXPECT_THROWS_MESSAGE(SerialiseRequest(request), InvalidStateException, "The HTTP request has been started already");
 }
 
-TEST(CreateHttpRequest, LetsNothingIntoTheRequestLineThatIsNotOfIt) {
+TEST(CreateHttpRequest, RefusesTextThatIsNotAllowedInTheRequestLine) {
   Ref<ClientRequest> request;
   for (const std::string &path :
        {std::string(), std::string("x"), std::string("http://h/"), std::string("*"), std::string("/a b"),
@@ -108,9 +101,17 @@ TEST(CreateHttpRequest, LetsNothingIntoTheRequestLineThatIsNotOfIt) {
   for (const std::string &method :
        {std::string(), std::string("PO ST"), std::string("POST\r\n"), std::string("P\0", 2)}) {
     EXPECT_THROWS_MESSAGE(CreateHttpRequest(method, "/", request), InvalidArgumentException,
-                          "Invalid argument : the method of an HTTP request is no token.");
+                          "Invalid argument : the method of an HTTP request is not a token.");
   }
   EXPECT_FALSE(request);
+}
+
+TEST(CreateHttpRequest, ReturnsARequestForEachCall) {
+  const Ref<ClientRequest> request = CreateHttpRequest("PUT", "/a");
+  const Ref<ClientRequest> other = CreateHttpRequest("PUT", "/b");
+  EXPECT_EQ(SerialiseRequest(request).substr(0, 17), "PUT /a HTTP/1.1\r\n");
+  EXPECT_EQ(SerialiseRequest(other).substr(0, 17), "PUT /b HTTP/1.1\r\n");
+  EXPECT_THROWS_MESSAGE(CreateHttpRequest("POST", "no-slash"), InvalidArgumentException, BAD_PATH);
 }
 
 } // namespace

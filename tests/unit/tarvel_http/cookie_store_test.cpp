@@ -3,9 +3,9 @@
 #include "http/cookie_date.h"
 #include "support/throws_message.h"
 
+#include <tarvel/core/environment.h>
 #include <tarvel/core/exception.h>
 #include <tarvel/http/cookie_store.h>
-#include <tarvel/system/environment.h>
 
 #include <gtest/gtest.h>
 
@@ -24,8 +24,6 @@ constexpr std::int64_t START = 1767323045 * SECOND; // 2026-01-02T03:04:05Z
 /// A store on a clock that only the test moves.
 class CookieStoreTest : public testing::Test {
 protected:
-  CookieStoreTest() { CreateCookieStore("", m_store); }
-
   void Set(std::string_view header, std::string_view host = "sts.example", std::string_view path = "/STS/trust",
            bool isSecure = true) {
     m_store->SetFromHeader(header, host, path, isSecure);
@@ -35,11 +33,11 @@ protected:
   }
 
   std::atomic<std::int64_t> m_now{START};
-  const System::ScopedEnvironment m_clock{{[this] { return m_now.load(); }, nullptr}};
-  Ref<CookieStore> m_store;
+  const ScopedEnvironment m_clock{{[this] { return m_now.load(); }, nullptr}};
+  const Ref<CookieStore> m_store = CreateCookieStore();
 };
 
-TEST_F(CookieStoreTest, GivesBackWhatWasSet) {
+TEST_F(CookieStoreTest, SendsBackTheCookiesThatWereSet) {
   EXPECT_EQ(Get(), "");
   Set("session=abc");
   EXPECT_EQ(Get(), "session=abc");
@@ -59,7 +57,7 @@ void PrintTo(const PairCase &pair, std::ostream *out) {
 
 class CookieStorePairs : public CookieStoreTest, public testing::WithParamInterface<PairCase> {};
 
-TEST_P(CookieStorePairs, AreReadAsTheStandardSays) {
+TEST_P(CookieStorePairs, AreParsedByTheStandard) {
   Set(GetParam().header);
   EXPECT_EQ(Get(), GetParam().expected);
 }
@@ -81,7 +79,7 @@ INSTANTIATE_TEST_SUITE_P(
                     PairCase{"a=b; Domain=x.sts.example", ""}, PairCase{"a=b; Domain=.", "a=b"},
                     PairCase{"a=b; Domain=other.example; Domain=sts.example", "a=b"}));
 
-TEST_F(CookieStoreTest, NeverGivesACookieToAnotherHost) {
+TEST_F(CookieStoreTest, NeverSendsACookieToAnotherHost) {
   Set("a=b");
   Set("wide=1; Domain=example");
   for (const char *host :
@@ -99,14 +97,14 @@ TEST_F(CookieStoreTest, MatchesAnAddressOnlyAsAWhole) {
 }
 
 struct PathCase {
-  std::string cookiePath; ///< empty: that of the request that set it
+  std::string cookiePath; ///< empty: the default path, from the request that set the cookie
   std::string setFrom;
   std::string requestPath;
   bool isSent;
 };
 
 void PrintTo(const PathCase &path, std::ostream *out) {
-  *out << path.cookiePath << " set from " << path.setFrom << ", asked for " << path.requestPath;
+  *out << path.cookiePath << " set from " << path.setFrom << ", requested " << path.requestPath;
 }
 
 class CookieStorePaths : public CookieStoreTest, public testing::WithParamInterface<PathCase> {};
@@ -129,7 +127,7 @@ INSTANTIATE_TEST_SUITE_P(Paths, CookieStorePaths,
                                          PathCase{"", "relative", "/anything", true},
                                          PathCase{"", "/a/b/", "/a/b/c", true}));
 
-TEST_F(CookieStoreTest, SendsASecureCookieOverASecureConnectionOnly) {
+TEST_F(CookieStoreTest, SendsASecureCookieOnlyOverASecureConnection) {
   Set("a=b; Secure");
   Set("c=d");
   EXPECT_EQ(Get("sts.example", "/STS/trust", false), "c=d");
@@ -153,7 +151,7 @@ TEST_F(CookieStoreTest, ReplacesACookieOfTheSameNamePathAndHostInItsPlace) {
   EXPECT_EQ(Get(), "a=4; a=3; b=2; A=5");
 }
 
-TEST_F(CookieStoreTest, ForgetsACookieWhenItsTimeIsOver) {
+TEST_F(CookieStoreTest, RemovesACookieThatHasExpired) {
   Set("a=b; Max-Age=10");
   m_now = START + 10 * SECOND - 1;
   EXPECT_EQ(Get(), "a=b");
@@ -181,7 +179,7 @@ void PrintTo(const ExpiryCase &expiry, std::ostream *out) {
 
 class CookieStoreExpiry : public CookieStoreTest, public testing::WithParamInterface<ExpiryCase> {};
 
-TEST_P(CookieStoreExpiry, IsReadAsTheStandardSays) {
+TEST_P(CookieStoreExpiry, IsParsedByTheStandard) {
   Set("a=b; " + GetParam().attributes);
   EXPECT_EQ(Get(), GetParam().isKept ? "a=b" : "");
   EXPECT_EQ(m_store->GetCount(), GetParam().isKept ? 1u : 0u);
@@ -200,14 +198,14 @@ INSTANTIATE_TEST_SUITE_P(
                     ExpiryCase{"Max-Age=0; Expires=Thu, 01 Jan 2099 00:00:00 GMT", false},
                     ExpiryCase{"Expires=never", true}, ExpiryCase{"Expires=", true}));
 
-TEST_F(CookieStoreTest, IsToldToForgetByAnExpiredCookie) {
+TEST_F(CookieStoreTest, RemovesACookieThatIsReplacedByAnExpiredOne) {
   Set("a=b");
   Set("a=; Max-Age=0");
   EXPECT_EQ(Get(), "");
   EXPECT_EQ(m_store->GetCount(), 0u);
 }
 
-TEST_F(CookieStoreTest, KeepsAtMostFiftyTheNewest) {
+TEST_F(CookieStoreTest, KeepsTheNewestFifty) {
   for (int i = 0; i < 200; ++i) {
     Set("name" + std::to_string(i) + "=v");
   }
@@ -223,13 +221,14 @@ TEST_F(CookieStoreTest, IgnoresACookieOfMoreThan4096Bytes) {
 }
 
 TEST(CreateCookieStore, MakesStoresThatShareNothing) {
-  Ref<CookieStore> one;
-  Ref<CookieStore> other;
-  CreateCookieStore("", one);
-  CreateCookieStore("", other);
+  const Ref<CookieStore> one = CreateCookieStore();
+  const Ref<CookieStore> other = CreateCookieStore();
+  Ref<CookieStore> third;
+  CreateCookieStore("", third);
   one->SetFromHeader("a=b", "h", "/", true);
   EXPECT_EQ(one->GetCount(), 1u);
   EXPECT_EQ(other->GetCount(), 0u);
+  EXPECT_EQ(third->GetCount(), 0u);
 }
 
 TEST(CreateCookieStore, RefusesAName) {
@@ -249,7 +248,7 @@ void PrintTo(const DateCase &date, std::ostream *out) {
 
 class ParseCookieDateTest : public testing::TestWithParam<DateCase> {};
 
-TEST_P(ParseCookieDateTest, ReadsWhatTheStandardReads) {
+TEST_P(ParseCookieDateTest, ParsesByTheStandard) {
   const std::optional<std::int64_t> date = ParseCookieDate(GetParam().text);
   ASSERT_EQ(date.has_value(), GetParam().seconds.has_value());
   if (date) {

@@ -1,5 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
-// The user agent over streams that a test holds in its hand. Over sockets it is tested in integration/transport.
+// The user agent over streams that a test controls. integration/transport tests it over sockets.
 
 #include "support/completion.h"
 #include "support/throws_message.h"
@@ -16,6 +16,7 @@
 #include <functional>
 #include <mutex>
 #include <new>
+#include <optional>
 #include <stdexcept>
 #include <string>
 #include <string_view>
@@ -26,8 +27,8 @@ namespace {
 
 constexpr std::int64_t LONG = 60 * 1000000;
 
-/// Answers at the first read, and never takes a written byte before it is closed.
-class AnsweringStream final : public System::Stream {
+/// Answers at the first read. A write never ends before the stream is closed.
+class AnsweringStream : public System::Stream {
 public:
   explicit AnsweringStream(std::string answer) : m_answer(std::move(answer)) {}
 
@@ -37,10 +38,17 @@ public:
     boost::asio::post(System::GetIoContext(), [handler, count] { handler(count, nullptr); });
   }
 
-  void AsyncWrite(const char *, std::size_t, TransferHandler handler) override {
+  void AsyncWrite(const char *bytes, std::size_t length, TransferHandler handler) override {
     const std::lock_guard<std::mutex> lock(m_mutex);
+    m_written.assign(bytes, length);
     ++m_writes;
     m_write = std::move(handler);
+  }
+
+  /// What the last write was to send.
+  std::string GetWritten() {
+    const std::lock_guard<std::mutex> lock(m_mutex);
+    return m_written;
   }
 
   int GetWriteCount() {
@@ -66,10 +74,18 @@ private:
   std::mutex m_mutex;
   std::string m_answer;
   TransferHandler m_write;
+  std::string m_written;
   int m_writes = 0;
 };
 
-/// Hands out one stream; without one it throws.
+/// A host's own stream that encrypts, or so it says.
+class SecureStream final : public AnsweringStream {
+public:
+  using AnsweringStream::AnsweringStream;
+  bool IsSecure() const noexcept override { return true; }
+};
+
+/// Connects to one stream; without one it throws.
 class OneStreamSpec : public CustomConnectionSpec {
 public:
   explicit OneStreamSpec(const Ref<System::Stream> &stream) : m_stream(stream) {}
@@ -93,25 +109,29 @@ private:
 class UserAgentTest : public testing::Test {
 protected:
   Ref<UserAgent> Create(const Ref<System::Stream> &stream) {
-    Ref<CookieStore> cookies;
-    CreateCookieStore("", cookies);
-    Ref<UserAgent> agent;
-    CreateHttpUserAgent(MakeRef<OneStreamSpec>(stream), cookies, nullptr, agent);
-    return agent;
+    return CreateHttpUserAgent(MakeRef<OneStreamSpec>(stream), m_cookies);
   }
 
   static Ref<ClientRequest> Post() {
-    Ref<ClientRequest> request;
-    CreateHttpRequest("POST", "/", request);
+    Ref<ClientRequest> request = CreateHttpRequest("POST", "/");
     request->WriteBody("body");
     return request;
   }
 
+  /// What the user agent writes to `stream` for a request.
+  std::string Send(const Ref<AnsweringStream> &stream) {
+    const Ref<UserAgent> agent = Create(stream);
+    agent->StartRequest(Post(), nullptr, m_pending);
+    agent->WaitForRequest(m_pending, LONG, m_response);
+    return stream->GetWritten();
+  }
+
+  const Ref<CookieStore> m_cookies = CreateCookieStore();
   Ref<PendingRequestItem> m_pending;
   Ref<ClientResponse> m_response;
 };
 
-TEST_F(UserAgentTest, TakesAnAnswerThatComesBeforeTheRequestIsSent) {
+TEST_F(UserAgentTest, AcceptsAnAnswerThatArrivesBeforeTheRequestIsSent) {
   const auto agent = Create(MakeRef<AnsweringStream>("HTTP/1.1 413 Too Large\r\nContent-Length: 4\r\n\r\nbody"));
   agent->StartRequest(Post(), nullptr, m_pending);
   agent->WaitForRequest(m_pending, LONG, m_response);
@@ -121,7 +141,7 @@ TEST_F(UserAgentTest, TakesAnAnswerThatComesBeforeTheRequestIsSent) {
   EXPECT_TRUE(m_pending->IsDone());
 }
 
-TEST_F(UserAgentTest, HandsOutTheHeadersAndTheBodyInPieces) {
+TEST_F(UserAgentTest, ReturnsTheHeadersAndTheBodyInPieces) {
   const auto agent = Create(MakeRef<AnsweringStream>("HTTP/1.1 200 OK\r\nX-One: 1\r\nx-one: 2\r\n"
                                                      "Content-Length: 5\r\n\r\nhello"));
   agent->StartRequest(Post(), nullptr, m_pending);
@@ -138,7 +158,7 @@ TEST_F(UserAgentTest, HandsOutTheHeadersAndTheBodyInPieces) {
   EXPECT_EQ(m_response->Read(buffer, 3), 0u);
 }
 
-TEST_F(UserAgentTest, HandsOnABodyOfLatin1AsUtf8AndItsHeadersAsTheyCame) {
+TEST_F(UserAgentTest, ReturnsALatin1BodyAsUtf8AndItsHeadersUnchanged) {
   const auto agent = Create(MakeRef<AnsweringStream>("HTTP/1.1 200 OK\r\nContent-Type: text/xml;charset=iso-8859-1\r\n"
                                                      "Content-Length: 1\r\n\r\n\xFC"));
   agent->StartRequest(Post(), nullptr, m_pending);
@@ -150,7 +170,7 @@ TEST_F(UserAgentTest, HandsOnABodyOfLatin1AsUtf8AndItsHeadersAsTheyCame) {
   EXPECT_EQ(m_response->ReadToEnd(100), "\xC3\xBC");
 }
 
-TEST_F(UserAgentTest, HandsOnABodyWithoutCharsetAsItCame) {
+TEST_F(UserAgentTest, ReturnsABodyWithoutCharsetUnchanged) {
   const auto agent = Create(MakeRef<AnsweringStream>("HTTP/1.1 200 OK\r\nContent-Length: 1\r\n\r\n\xFC"));
   agent->StartRequest(Post(), nullptr, m_pending);
   agent->WaitForRequest(m_pending, LONG, m_response);
@@ -205,28 +225,85 @@ TEST_F(UserAgentTest, StartsNothingWhenTheSpecificationThrows) {
   EXPECT_FALSE(wasCalled);
 }
 
-TEST_F(UserAgentTest, RefusesWhatItCannotWorkWith) {
+TEST_F(UserAgentTest, RefusesObjectsThatItCannotUse) {
   const auto agent = Create(MakeRef<AnsweringStream>(""));
   EXPECT_THROWS_MESSAGE(agent->StartRequest(nullptr, nullptr, m_pending), InvalidArgumentException,
                         "Invalid argument : the HTTP request was not made by CreateHttpRequest.");
   EXPECT_THROWS_MESSAGE(agent->WaitForRequest(nullptr, LONG, m_response), InvalidArgumentException,
-                        "Invalid argument : the item to wait for is no started HTTP request.");
-  Ref<CookieStore> cookies;
-  Ref<UserAgent> other;
-  EXPECT_THROWS_MESSAGE(CreateHttpUserAgent(MakeRef<OneStreamSpec>(nullptr), cookies, nullptr, other),
-                        InvalidArgumentException,
-                        "Invalid argument : a user agent needs a connection specification and a cookie store.");
-  class Pool final : public ConnectionPool {};
-  CreateCookieStore("", cookies);
-  EXPECT_THROWS_MESSAGE(
-      CreateHttpUserAgent(MakeRef<OneStreamSpec>(nullptr), cookies, MakeRef<Pool>(), other), InvalidArgumentException,
-      "Invalid argument : a user agent opens one connection for each request; connection pools are not offered.");
+                        "Invalid argument : the item to wait for is not a started HTTP request.");
 }
 
-/// Says that it has connected, and has no stream to show for it.
-class EmptyHandedSpec final : public OneStreamSpec {
+TEST_F(UserAgentTest, IsNotMadeWithoutASpecificationOrACookieStoreOrWithAPool) {
+  const std::string needed = "Invalid argument : a user agent needs a connection specification and a cookie store.";
+  const Ref<ConnectionSpec> spec = MakeRef<OneStreamSpec>(nullptr);
+  Ref<UserAgent> agent;
+  EXPECT_THROWS_MESSAGE(CreateHttpUserAgent(spec, nullptr, nullptr, agent), InvalidArgumentException, needed);
+  EXPECT_THROWS_MESSAGE(CreateHttpUserAgent(nullptr, m_cookies, nullptr, agent), InvalidArgumentException, needed);
+  EXPECT_THROWS_MESSAGE(CreateHttpUserAgent(spec, nullptr), InvalidArgumentException, needed);
+  EXPECT_THROWS_MESSAGE(CreateHttpUserAgent(nullptr, m_cookies), InvalidArgumentException, needed);
+  class Pool final : public ConnectionPool {};
+  EXPECT_THROWS_MESSAGE(
+      CreateHttpUserAgent(spec, m_cookies, MakeRef<Pool>(), agent), InvalidArgumentException,
+      "Invalid argument : a user agent opens one connection for each request; connection pools are not offered.");
+  EXPECT_FALSE(agent);
+}
+
+constexpr const char *SETS_COOKIES = "HTTP/1.1 200 OK\r\nSet-Cookie: c=d; Path=/\r\nContent-Length: 0\r\n\r\n";
+
+TEST_F(UserAgentTest, SendsSecureCookiesOverAHostsOwnStreamThatIsSecure) {
+  m_cookies->SetFromHeader("a=b; Secure; Path=/", "sts.example", "/", true);
+  m_cookies->SetFromHeader("plain=1; Path=/", "sts.example", "/", true);
+  EXPECT_EQ(Send(MakeRef<SecureStream>(SETS_COOKIES)), "POST / HTTP/1.1\r\n"
+                                                       "Host: sts.example:80\r\n"
+                                                       "User-Agent: tarvel\r\n"
+                                                       "Cookie: a=b; plain=1\r\n"
+                                                       "Accept-Encoding: identity\r\n"
+                                                       "Connection: close\r\n"
+                                                       "Content-Length: 4\r\n"
+                                                       "\r\n"
+                                                       "body");
+}
+
+TEST_F(UserAgentTest, SendsNoSecureCookiesOverAHostsOwnStreamThatDoesNotSayItIsSecure) {
+  m_cookies->SetFromHeader("a=b; Secure; Path=/", "sts.example", "/", true);
+  m_cookies->SetFromHeader("plain=1; Path=/", "sts.example", "/", true);
+  EXPECT_EQ(Send(MakeRef<AnsweringStream>(SETS_COOKIES)), "POST / HTTP/1.1\r\n"
+                                                          "Host: sts.example\r\n"
+                                                          "User-Agent: tarvel\r\n"
+                                                          "Cookie: plain=1\r\n"
+                                                          "Accept-Encoding: identity\r\n"
+                                                          "Connection: close\r\n"
+                                                          "Content-Length: 4\r\n"
+                                                          "\r\n"
+                                                          "body");
+}
+
+TEST_F(UserAgentTest, ReportsToTheCookieStoreWhetherTheStreamIsSecure) {
+  class RecordingCookies final : public CookieStore {
+  public:
+    void SetFromHeader(std::string_view, std::string_view, std::string_view, bool isSecure) override {
+      wasSecure = isSecure;
+    }
+    std::string GetHeader(std::string_view, std::string_view, bool) const override { return {}; }
+    std::size_t GetCount() const override { return 0; }
+
+    std::optional<bool> wasSecure;
+  };
+  const auto answer = [this](const Ref<System::Stream> &stream) {
+    const auto cookies = MakeRef<RecordingCookies>();
+    const Ref<UserAgent> agent = CreateHttpUserAgent(MakeRef<OneStreamSpec>(stream), cookies);
+    agent->StartRequest(Post(), nullptr, m_pending);
+    agent->WaitForRequest(m_pending, LONG, m_response);
+    return cookies->wasSecure;
+  };
+  EXPECT_EQ(answer(MakeRef<SecureStream>(SETS_COOKIES)), true);
+  EXPECT_EQ(answer(MakeRef<AnsweringStream>(SETS_COOKIES)), false);
+}
+
+/// Reports that it has connected, but without a stream.
+class StreamlessSpec final : public OneStreamSpec {
 public:
-  EmptyHandedSpec() : OneStreamSpec(nullptr) {}
+  StreamlessSpec() : OneStreamSpec(nullptr) {}
 
   Ref<System::ScheduledItem> AsyncConnect(ConnectCompletion completion) const override {
     boost::asio::post(System::GetIoContext(), [completion] { completion(nullptr, nullptr); });
@@ -235,16 +312,13 @@ public:
 };
 
 TEST_F(UserAgentTest, ReportsASpecificationThatGivesNeitherAStreamNorAFailure) {
-  Ref<CookieStore> cookies;
-  CreateCookieStore("", cookies);
-  Ref<UserAgent> agent;
-  CreateHttpUserAgent(MakeRef<EmptyHandedSpec>(), cookies, nullptr, agent);
+  const Ref<UserAgent> agent = CreateHttpUserAgent(MakeRef<StreamlessSpec>(), m_cookies);
   agent->StartRequest(Post(), nullptr, m_pending);
   EXPECT_THROWS_MESSAGE(agent->WaitForRequest(m_pending, LONG, m_response), InvalidStateException,
                         "A connection specification reported neither a stream nor a failure");
 }
 
-/// What foreign code may throw, and what the completion function gets.
+/// Something that foreign code may throw, and what the completion function gets then.
 struct Thrown {
   std::function<void()> raise;
   std::string message;
@@ -273,7 +347,7 @@ std::string Describe(const Exception &exception) {
 
 enum class Place { WRITE, READ, COOKIES, HOST };
 
-/// Throws where it is asked to; otherwise as the stream that it derives from.
+/// Throws at one place; otherwise it passes everything on to an `AnsweringStream`.
 class ThrowingStream final : public System::Stream {
 public:
   ThrowingStream(Place place, std::function<void()> raise)
@@ -311,7 +385,7 @@ private:
   const std::function<void()> m_raise;
 };
 
-/// Throws when it is asked for the host.
+/// Throws when its host is requested.
 class HostlessSpec final : public OneStreamSpec {
 public:
   HostlessSpec(const Ref<System::Stream> &stream, std::function<void()> raise)
@@ -325,7 +399,7 @@ private:
   const std::function<void()> m_raise;
 };
 
-TEST_F(UserAgentTest, CallsTheCompletionFunctionOnceForWhateverIsThrown) {
+TEST_F(UserAgentTest, CallsTheCompletionFunctionOnceWhenForeignCodeThrows) {
   for (const Thrown &thrown : THROWN) {
     for (const Place place : {Place::WRITE, Place::READ, Place::COOKIES, Place::HOST}) {
       const auto stream = MakeRef<ThrowingStream>(place, thrown.raise);
@@ -333,8 +407,7 @@ TEST_F(UserAgentTest, CallsTheCompletionFunctionOnceForWhateverIsThrown) {
           MakeRef<ThrowingCookies>(place == Place::COOKIES ? thrown.raise : std::function<void()>([] {}));
       const Ref<ConnectionSpec> spec =
           MakeRef<HostlessSpec>(stream, place == Place::HOST ? thrown.raise : std::function<void()>([] {}));
-      Ref<UserAgent> agent;
-      CreateHttpUserAgent(spec, cookies, nullptr, agent);
+      const Ref<UserAgent> agent = CreateHttpUserAgent(spec, cookies);
       int calls = 0;
       std::string message;
       agent->StartRequest(
@@ -352,7 +425,7 @@ TEST_F(UserAgentTest, CallsTheCompletionFunctionOnceForWhateverIsThrown) {
   }
 }
 
-/// Calls back, in the starting call, as often as it is asked to, and then throws.
+/// Calls back a number of times, within the starting call, and then throws.
 class HastySpec final : public OneStreamSpec {
 public:
   HastySpec(const Ref<System::Stream> &stream, int calls, bool fails)
@@ -379,10 +452,7 @@ TEST_F(UserAgentTest, EitherThrowsOrCallsTheCompletionFunctionOnceWhateverTheSpe
     for (const bool fails : {false, true}) {
       const auto stream = MakeRef<AnsweringStream>("HTTP/1.1 200 OK\r\nContent-Length: 0\r\n\r\n");
       const auto spec = MakeRef<HastySpec>(stream, connectCalls, fails);
-      Ref<CookieStore> cookies;
-      CreateCookieStore("", cookies);
-      Ref<UserAgent> agent;
-      CreateHttpUserAgent(spec, cookies, nullptr, agent);
+      const Ref<UserAgent> agent = CreateHttpUserAgent(spec, m_cookies);
       int calls = 0;
       const auto count = [&](const Exception *, const Ref<ClientResponse> &, const Ref<PendingRequestItem> &) {
         ++calls;

@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
-// A test ends its process while a server of its own has threads that nobody has joined yet; some of them are over by then.
-// ThreadSanitizer would report these.
+// One test ends its process while its server has threads that are not joined. ThreadSanitizer would report those that have
+// ended.
 
 extern "C" const char *ThreadSanitizerOptions() __asm__("__tsan_default_options");
 

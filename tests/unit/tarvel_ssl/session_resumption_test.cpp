@@ -22,9 +22,9 @@ using Testing::TlsCertificate;
 using Testing::TlsClient;
 using Testing::TlsSettings;
 
-/// Says what the server thinks of the handshake.
-void TellWhetherResumed(ServerConnection &connection) {
-  if (connection.ShakeHands()) {
+/// Sends the client how the server sees the handshake: "resumed" or "full".
+void ReportWhetherResumed(ServerConnection &connection) {
+  if (connection.Handshake()) {
     connection.Write(connection.WasResumed() ? "resumed" : "full");
     connection.ReadSome();
   }
@@ -38,68 +38,68 @@ protected:
     return settings;
   }
 
-  /// "full" or "resumed", on which both sides must agree, or the message of what went wrong.
+  /// "full" or "resumed", on which both sides must agree; or the message of a failure.
   std::string Connect(const std::string &host = "localhost", const std::string &parameter = "") {
     TlsClient client(m_context, m_server.GetPort());
-    if (const std::string failure = client.ShakeHands(host, parameter); !failure.empty()) {
+    if (const std::string failure = client.Handshake(host, parameter); !failure.empty()) {
       return failure;
     }
-    std::string told = client.Read();
-    EXPECT_EQ(client.GetStream()->WasResumed(), told == "resumed");
+    std::string reported = client.Read();
+    EXPECT_EQ(client.GetStream()->WasResumed(), reported == "resumed");
     client.GetStream()->Close();
-    return told;
+    return reported;
   }
 
   std::size_t CountSessions() const { return dynamic_cast<SSLContextImpl &>(*m_context).GetSessions().GetSize(); }
 
   const Ref<SSLContext> m_context = CreateTrustingContext();
-  ScriptedServer m_server{TellWhetherResumed, Settings()};
+  ScriptedServer m_server{ReportWhetherResumed, Settings()};
 };
 
-TEST_P(SessionResumption, TheSecondConnectionAndAllLaterOnesAreResumed) {
+TEST_P(SessionResumption, ResumesTheSecondAndAllLaterConnections) {
   EXPECT_EQ(Connect(), "full");
   for (int i = 0; i < 5; ++i) {
     EXPECT_EQ(Connect(), "resumed") << i;
   }
 }
 
-TEST_P(SessionResumption, ASessionIsResumedThoughItsConnectionWasOnlyDropped) {
+TEST_P(SessionResumption, ResumesTheSessionOfAConnectionThatWasOnlyReleased) {
   {
     TlsClient client(m_context, m_server.GetPort());
-    ASSERT_EQ(client.ShakeHands(), "");
+    ASSERT_EQ(client.Handshake(), "");
     ASSERT_EQ(client.Read(), "full");
   }
-  EXPECT_TRUE(Testing::Eventually([this] { return CountSessions() > 0; })); // an I/O thread may hold the stream a bit
+  EXPECT_TRUE(Testing::Eventually([this] { return CountSessions() > 0; })); // an I/O thread may still hold a reference
   EXPECT_EQ(Connect(), "resumed");
 }
 
-// OpenSSL changes and copies the session of a living connection without a lock.
-TEST_P(SessionResumption, ASessionIsResumedOnlyOnceItsConnectionHasEnded) {
+// OpenSSL modifies and copies the session of an open connection without a lock.
+TEST_P(SessionResumption, ResumesASessionOnlyAfterItsConnectionHasEnded) {
   TlsClient first(m_context, m_server.GetPort());
-  ASSERT_EQ(first.ShakeHands(), "");
+  ASSERT_EQ(first.Handshake(), "");
   ASSERT_EQ(first.Read(), "full");
   TlsClient second(m_context, m_server.GetPort());
-  ASSERT_EQ(second.ShakeHands(), "");
+  ASSERT_EQ(second.Handshake(), "");
   EXPECT_EQ(second.Read(), "full");
   EXPECT_EQ(CountSessions(), 0u);
   first.GetStream()->Close();
   EXPECT_GT(CountSessions(), 0u);
   TlsClient third(m_context, m_server.GetPort());
-  ASSERT_EQ(third.ShakeHands(), "");
+  ASSERT_EQ(third.Handshake(), "");
   EXPECT_EQ(third.Read(), "resumed");
 }
 
-TEST_P(SessionResumption, NoSessionIsResumedAfterAFatalAlert) {
-  ScriptedServer garbling(
+TEST_P(SessionResumption, ResumesNoSessionAfterAFatalAlert) {
+  ScriptedServer corrupting(
       [](ServerConnection &connection) {
-        if (connection.ShakeHands() && connection.Write("full")) {
+        if (connection.Handshake() && connection.Write("full")) {
           connection.WriteRaw(std::string("\x17\x03\x03\x00\x20", 5) + std::string(32, 'x'));
           connection.ReadSome();
         }
       },
       Settings());
-  TlsClient client(m_context, garbling.GetPort());
-  ASSERT_EQ(client.ShakeHands(), "");
+  TlsClient client(m_context, corrupting.GetPort());
+  ASSERT_EQ(client.Handshake(), "");
   ASSERT_EQ(client.Read(), "full");
   client.Read();
   EXPECT_TRUE(client.HasFailed());
@@ -107,7 +107,7 @@ TEST_P(SessionResumption, NoSessionIsResumedAfterAFatalAlert) {
   EXPECT_EQ(CountSessions(), 0u);
 }
 
-TEST_P(SessionResumption, EveryHostNameHasSessionsOfItsOwn) {
+TEST_P(SessionResumption, KeepsSeparateSessionsForEachHostName) {
   EXPECT_EQ(Connect("localhost"), "full");
   EXPECT_EQ(Connect("127.0.0.1"), "full");
   EXPECT_EQ(Connect("other.example"),
@@ -117,12 +117,12 @@ TEST_P(SessionResumption, EveryHostNameHasSessionsOfItsOwn) {
   EXPECT_EQ(Connect("127.0.0.1"), "resumed");
 }
 
-TEST_P(SessionResumption, EveryThumbprintHasSessionsOfItsOwn) {
+TEST_P(SessionResumption, KeepsSeparateSessionsForEachThumbprint) {
   const std::string right = TlsCertificate("localhost")->GetSha256Thumbprint();
   const std::string wrong = TlsCertificate("expired")->GetSha256Thumbprint();
   EXPECT_EQ(Connect("other.example", right), "full");
   EXPECT_EQ(Connect("other.example", right), "resumed");
-  // A session whose name nobody checked must not let a connection through whose name has to be checked.
+  // A connection whose name must be checked must not resume a session whose name was not checked.
   EXPECT_NE(Connect("other.example"), "resumed");
   EXPECT_EQ(Connect("localhost"), "full");
   EXPECT_EQ(Connect("localhost"), "resumed");
@@ -133,26 +133,26 @@ TEST_P(SessionResumption, EveryThumbprintHasSessionsOfItsOwn) {
   EXPECT_EQ(Connect("localhost", right), "resumed");
 }
 
-TEST_P(SessionResumption, AnotherContextKnowsNothingOfThem) {
+TEST_P(SessionResumption, DoesNotShareSessionsBetweenContexts) {
   EXPECT_EQ(Connect(), "full");
   TlsClient client(CreateTrustingContext(), m_server.GetPort());
-  EXPECT_EQ(client.ShakeHands(), "");
+  EXPECT_EQ(client.Handshake(), "");
   EXPECT_EQ(client.Read(), "full");
 }
 
-TEST_P(SessionResumption, ChangingWhatIsTrustedForgetsThem) {
+TEST_P(SessionResumption, ForgetsSessionsWhenTrustChanges) {
   EXPECT_EQ(Connect(), "full");
   m_context->TrustCertificates({TlsCertificate("unknown-authority")});
   EXPECT_EQ(Connect(), "full");
 }
 
-TEST_P(SessionResumption, AServerThatForgotGetsAFullHandshake) {
+TEST_P(SessionResumption, MakesAFullHandshakeWithAServerThatForgotTheSession) {
   TlsSettings settings = Settings();
   settings.resumesSessions = false;
-  ScriptedServer forgetful(TellWhetherResumed, settings);
+  ScriptedServer forgetful(ReportWhetherResumed, settings);
   for (int i = 0; i < 3; ++i) {
     TlsClient client(m_context, forgetful.GetPort());
-    EXPECT_EQ(client.ShakeHands(), "");
+    EXPECT_EQ(client.Handshake(), "");
     EXPECT_EQ(client.Read(), "full");
     client.GetStream()->Close();
   }
@@ -161,19 +161,19 @@ TEST_P(SessionResumption, AServerThatForgotGetsAFullHandshake) {
 INSTANTIATE_TEST_SUITE_P(Versions, SessionResumption, testing::Values(TLS1_2_VERSION, TLS1_3_VERSION),
                          [](const auto &version) { return version.param == TLS1_2_VERSION ? "TLS12" : "TLS13"; });
 
-TEST(SessionsOfOneConnection, AreBounded) {
+TEST(SSLStream, KeepsAtMostEightSessions) {
   TlsSettings settings;
   settings.tickets = 100;
-  ScriptedServer server(TellWhetherResumed, settings);
+  ScriptedServer server(ReportWhetherResumed, settings);
   const Ref<SSLContext> context = CreateTrustingContext();
   TlsClient client(context, server.GetPort());
-  ASSERT_EQ(client.ShakeHands(), "");
+  ASSERT_EQ(client.Handshake(), "");
   EXPECT_EQ(client.Read(), "full");
   client.GetStream()->Close();
   EXPECT_EQ(dynamic_cast<SSLContextImpl &>(*context).GetSessions().GetSize(), 8u);
 }
 
-TEST(SessionCache, ForgetsWhatCannotBeResumed) {
+TEST(SessionCache, ForgetsASessionThatIsNotResumable) {
   SessionCache cache;
   cache.Put("key", SessionHandle(SSL_SESSION_new())); // no identifier, no ticket, no certificate
   EXPECT_FALSE(cache.Take("key"));

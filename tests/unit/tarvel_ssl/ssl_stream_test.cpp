@@ -35,7 +35,7 @@ using Testing::TlsClient;
 using Testing::TlsSettings;
 
 void Echo(ServerConnection &connection) {
-  if (!connection.ShakeHands()) {
+  if (!connection.Handshake()) {
     return;
   }
   for (std::string some = connection.ReadSome(); !some.empty(); some = connection.ReadSome()) {
@@ -49,11 +49,18 @@ TEST(SSLStream, ExchangesBytesOverEachAllowedVersion) {
     settings.minimumVersion = settings.maximumVersion = version;
     ScriptedServer server(Echo, settings);
     TlsClient client(CreateTrustingContext(), server.GetPort());
-    ASSERT_EQ(client.ShakeHands(), "") << version;
+    ASSERT_EQ(client.Handshake(), "") << version;
     EXPECT_EQ(client.Write("hello"), "");
     EXPECT_EQ(client.Read(), "hello");
     EXPECT_FALSE(client.GetStream()->WasResumed());
   }
+}
+
+TEST(SSLStream, IsSecureButTheTcpConnectionBelowIsNot) {
+  const Ref<System::Stream> socket = System::CreateTcpClientSocket();
+  EXPECT_FALSE(socket->IsSecure());
+  const Ref<System::Stream> stream = CreateTrustingContext()->CreateStream(socket, "localhost");
+  EXPECT_TRUE(stream->IsSecure());
 }
 
 TEST(SSLStream, SendsTheServerNameButNoAddress) {
@@ -61,15 +68,15 @@ TEST(SSLStream, SendsTheServerNameButNoAddress) {
   int next = 0;
   ScriptedServer server(
       [&](ServerConnection &connection) {
-        connection.ShakeHands();
+        connection.Handshake();
         names[next++].set_value(connection.GetServerName());
       },
       TlsSettings());
   TlsClient byName(CreateTrustingContext(), server.GetPort());
-  EXPECT_EQ(byName.ShakeHands("LocalHost."), "");
+  EXPECT_EQ(byName.Handshake("LocalHost."), "");
   EXPECT_EQ(names[0].get_future().get(), "localhost");
   TlsClient byAddress(CreateTrustingContext(), server.GetPort());
-  EXPECT_EQ(byAddress.ShakeHands("127.0.0.1"), "");
+  EXPECT_EQ(byAddress.Handshake("127.0.0.1"), "");
   EXPECT_EQ(names[1].get_future().get(), "");
 }
 
@@ -77,10 +84,10 @@ TEST(SSLStream, ChecksAddressesAgainstTheCertificate) {
   ScriptedServer server(Echo, TlsSettings());
   for (const char *host : {"127.0.0.1", "::1", "[::1]", "::1%lo"}) {
     TlsClient client(CreateTrustingContext(), server.GetPort());
-    EXPECT_EQ(client.ShakeHands(host), "") << host;
+    EXPECT_EQ(client.Handshake(host), "") << host;
   }
   TlsClient client(CreateTrustingContext(), server.GetPort());
-  EXPECT_EQ(client.ShakeHands("127.0.0.2"),
+  EXPECT_EQ(client.Handshake("127.0.0.2"),
             "The TLS handshake with 127.0.0.2 failed: the server's certificate was not accepted: IP address mismatch "
             "(certificate \"CN=localhost\")");
 }
@@ -88,12 +95,12 @@ TEST(SSLStream, ChecksAddressesAgainstTheCertificate) {
 TEST(SSLStream, MovesLargeMessagesBothWays) {
   ScriptedServer server(
       [](ServerConnection &connection) {
-        connection.ShakeHands();
+        connection.Handshake();
         connection.Write(connection.ReadExactly(4u << 20));
       },
       TlsSettings());
   TlsClient client(CreateTrustingContext(), server.GetPort());
-  ASSERT_EQ(client.ShakeHands(), "");
+  ASSERT_EQ(client.Handshake(), "");
   std::string message(4u << 20, '\0');
   for (std::size_t i = 0; i < message.size(); ++i) {
     message[i] = static_cast<char>(i * 31 + i / 4096);
@@ -111,12 +118,12 @@ TEST(SSLStream, MovesLargeMessagesBothWays) {
 TEST(SSLStream, ReadsTheClosingNoticeAsTheOrderlyEnd) {
   ScriptedServer server(
       [](ServerConnection &connection) {
-        connection.ShakeHands();
+        connection.Handshake();
         connection.Write("bye");
       },
       TlsSettings());
   TlsClient client(CreateTrustingContext(), server.GetPort());
-  ASSERT_EQ(client.ShakeHands(), "");
+  ASSERT_EQ(client.Handshake(), "");
   EXPECT_EQ(client.Read(), "bye");
   EXPECT_EQ(client.Read(), "");
   EXPECT_FALSE(client.HasFailed());
@@ -124,16 +131,16 @@ TEST(SSLStream, ReadsTheClosingNoticeAsTheOrderlyEnd) {
   EXPECT_FALSE(client.HasFailed());
 }
 
-TEST(SSLStream, AnEndWithoutClosingNoticeIsAFailure) {
+TEST(SSLStream, ReportsAnEndWithoutClosingNoticeAsAFailure) {
   ScriptedServer server(
       [](ServerConnection &connection) {
-        connection.ShakeHands();
+        connection.Handshake();
         connection.Write("half");
         connection.CloseWithoutNotice();
       },
       TlsSettings());
   TlsClient client(CreateTrustingContext(), server.GetPort());
-  ASSERT_EQ(client.ShakeHands(), "");
+  ASSERT_EQ(client.Handshake(), "");
   EXPECT_EQ(client.Read(), "half");
   const std::string failure =
       "The TLS connection to localhost broke: the server ended the connection without TLS's closing notice";
@@ -143,25 +150,25 @@ TEST(SSLStream, AnEndWithoutClosingNoticeIsAFailure) {
   EXPECT_EQ(client.Write("x"), failure);
 }
 
-TEST(SSLStream, ClosingSendsTheClosingNotice) {
+TEST(SSLStream, SendsTheClosingNoticeWhenItIsClosed) {
   std::promise<bool> noticed;
   ScriptedServer server(
       [&](ServerConnection &connection) {
-        connection.ShakeHands();
+        connection.Handshake();
         connection.Write("x");
         connection.ReadSome();
         noticed.set_value(connection.ReceivedClosingNotice());
       },
       TlsSettings());
   TlsClient client(CreateTrustingContext(), server.GetPort());
-  ASSERT_EQ(client.ShakeHands(), "");
-  EXPECT_EQ(client.Read(), "x"); // what lies unread at the end would make the kernel send a reset
+  ASSERT_EQ(client.Handshake(), "");
+  EXPECT_EQ(client.Read(), "x"); // unread bytes would make the kernel send a reset
   client.GetStream()->Close();
   EXPECT_TRUE(noticed.get_future().get());
 }
 
 TEST(SSLStream, ReportsAResetBeforeTheHandshake) {
-  std::promise<void> connected; // a reset that comes too soon makes the connect fail
+  std::promise<void> connected; // an earlier reset would make the connect fail
   ScriptedServer server(
       [future = connected.get_future().share()](ServerConnection &connection) {
         future.wait_for(PATIENCE);
@@ -170,8 +177,8 @@ TEST(SSLStream, ReportsAResetBeforeTheHandshake) {
       TlsSettings());
   TlsClient client(CreateTrustingContext(), server.GetPort());
   connected.set_value();
-  // The kernel tells a reset once: if the write meets it, the read that runs beside it sees an end.
-  const std::string message = client.ShakeHands();
+  // The kernel reports a reset only once: if the write gets it, the concurrent read sees an orderly end.
+  const std::string message = client.Handshake();
   EXPECT_EQ(message.rfind("The TLS handshake with localhost failed: ", 0), 0u) << message;
   EXPECT_TRUE(client.FailedInHandshake());
 }
@@ -185,14 +192,14 @@ TEST(SSLStream, ReportsAResetWithinTheHandshake) {
       },
       TlsSettings());
   TlsClient client(CreateTrustingContext(), server.GetPort());
-  EXPECT_EQ(client.ShakeHands(), "The TLS handshake with localhost failed: The connection to 127.0.0.1:" +
-                                     std::to_string(server.GetPort()) + " broke: Connection reset by peer");
+  EXPECT_EQ(client.Handshake(), "The TLS handshake with localhost failed: The connection to 127.0.0.1:" +
+                                    std::to_string(server.GetPort()) + " broke: Connection reset by peer");
 }
 
 TEST(SSLStream, ReportsAnEndWithinTheHandshake) {
   ScriptedServer server([](ServerConnection &connection) { connection.ReadRawSome(); }, TlsSettings());
   TlsClient client(CreateTrustingContext(), server.GetPort());
-  EXPECT_EQ(client.ShakeHands(),
+  EXPECT_EQ(client.Handshake(),
             "The TLS handshake with localhost failed: the server ended the connection without TLS's "
             "closing notice");
 }
@@ -204,10 +211,10 @@ TEST(SSLStream, ReportsAnOrderlyEndWithinTheHandshake) {
     connection.Stall();
   });
   TlsClient client(CreateTrustingContext(), server.GetPort());
-  EXPECT_EQ(client.ShakeHands(), "The TLS handshake with localhost failed: the server ended the connection");
+  EXPECT_EQ(client.Handshake(), "The TLS handshake with localhost failed: the server ended the connection");
 }
 
-/// A stream over TCP whose writes fail once they are told to, as when the server has reset the connection.
+/// A stream over TCP. After `Break` its writes fail, as they do when the server has reset the connection.
 class BrokenWriter final : public System::Stream {
 public:
   explicit BrokenWriter(const Ref<System::Stream> &inner) : m_inner(inner) {}
@@ -234,7 +241,7 @@ private:
   std::atomic<bool> m_isBroken{false};
 };
 
-/// A TLS connection to a server that may go on once writing is broken.
+/// A TLS connection on which writing breaks, before or after the handshake, and reading goes on.
 class BrokenConnection {
 public:
   BrokenConnection(int port, bool beforeTheHandshake) {
@@ -273,7 +280,7 @@ private:
   Ref<SSLContext> m_context;
 };
 
-/// A stream of a host's own: each start throws what the test says.
+/// A host's own stream. Each start throws what the test chooses.
 class ThrowingStream final : public System::Stream {
 public:
   explicit ThrowingStream(std::function<void()> start) : m_start(std::move(start)) {}
@@ -286,7 +293,7 @@ private:
   const std::function<void()> m_start;
 };
 
-TEST(SSLStream, EndsTheHandshakeOnceWhateverTheStreamBelowThrows) {
+TEST(SSLStream, EndsTheHandshakeOnceWhenTheStreamBelowThrows) {
   const std::string failed = "The TLS handshake with localhost failed: ";
   struct Case {
     std::function<void()> start;
@@ -307,11 +314,11 @@ TEST(SSLStream, EndsTheHandshakeOnceWhateverTheStreamBelowThrows) {
   }
 }
 
-TEST(SSLStream, ReadsWhatTheServerSentAfterAWriteHasFailed) {
+TEST(SSLStream, ReadsBytesThatTheServerSentAfterAFailedWrite) {
   std::promise<void> failed;
   ScriptedServer server(
       [future = failed.get_future().share()](ServerConnection &connection) {
-        connection.ShakeHands();
+        connection.Handshake();
         future.wait_for(PATIENCE);
         connection.Write("413");
       },
@@ -329,7 +336,7 @@ TEST(SSLStream, ReportsTheFailedWriteWhenTheServerEndsWithoutNotice) {
   std::promise<void> failed;
   ScriptedServer server(
       [future = failed.get_future().share()](ServerConnection &connection) {
-        connection.ShakeHands();
+        connection.Handshake();
         future.wait_for(PATIENCE);
         connection.CloseWithoutNotice();
       },
@@ -361,7 +368,7 @@ TEST(SSLStream, ReportsThatACertificateIsRequired) {
   TlsSettings settings;
   settings.demandsClient = true;
   settings.minimumVersion = TLS1_3_VERSION;
-  ScriptedServer server([](ServerConnection &connection) { connection.ShakeHands(); }, settings);
+  ScriptedServer server([](ServerConnection &connection) { connection.Handshake(); }, settings);
   const BrokenConnection client(server.GetPort(), false);
   EXPECT_EQ(client.handshake.GetMessage(), "");
   EXPECT_EQ(client.Write("request"), "The TLS connection to localhost broke: Broken pipe");
@@ -376,7 +383,7 @@ TEST(SSLStream, ReportsAServerThatDoesNotSpeakTls) {
     connection.Stall();
   });
   TlsClient client(CreateTrustingContext(), server.GetPort());
-  EXPECT_EQ(client.ShakeHands(),
+  EXPECT_EQ(client.Handshake(),
             "The TLS handshake with localhost failed: error:0A00010B:SSL routines::wrong version number");
 }
 
@@ -387,47 +394,47 @@ TEST(SSLStream, RefusesAServerThatOffersOnlyOldTls) {
   settings.allowsWeakness = true;
   ScriptedServer server(Echo, settings);
   TlsClient client(CreateTrustingContext(), server.GetPort());
-  const std::string message = client.ShakeHands();
+  const std::string message = client.Handshake();
   EXPECT_EQ(message.rfind("The TLS handshake with localhost failed: error:", 0), 0u) << message;
   EXPECT_NE(message.find("alert protocol version"), std::string::npos) << message;
 }
 
-TEST(SSLStream, ABrokenRecordIsAFailure) {
+TEST(SSLStream, ReportsACorruptRecordAsAFailure) {
   ScriptedServer server(
       [](ServerConnection &connection) {
-        connection.ShakeHands();
+        connection.Handshake();
         connection.WriteRaw(std::string("\x17\x03\x03\x00\x20", 5) + std::string(32, 'x'));
         connection.Stall();
       },
       TlsSettings());
   TlsClient client(CreateTrustingContext(), server.GetPort());
-  ASSERT_EQ(client.ShakeHands(), "");
+  ASSERT_EQ(client.Handshake(), "");
   const std::string message = client.Read();
   EXPECT_EQ(message.rfind("The TLS connection to localhost broke: error:", 0), 0u) << message;
 }
 
-TEST(SSLStream, ClosingEndsAHandshakeThatStalls) {
+TEST(SSLStream, EndsAStalledHandshakeWhenItIsClosed) {
   ScriptedServer server([](ServerConnection &connection) { connection.Stall(); }, TlsSettings());
   TlsClient client(CreateTrustingContext(), server.GetPort());
-  Completion shaken;
-  client.GetStream()->AsyncHandshake("localhost", "", shaken.ForEnd());
+  Completion handshake;
+  client.GetStream()->AsyncHandshake("localhost", "", handshake.ForEnd());
   ASSERT_TRUE(Testing::DrainIoThreads());
-  EXPECT_EQ(shaken.GetCalls(), 0);
+  EXPECT_EQ(handshake.GetCalls(), 0);
   client.GetStream()->Close();
-  EXPECT_EQ(shaken.GetMessage(), "The TLS handshake with localhost failed: closed by this side");
+  EXPECT_EQ(handshake.GetMessage(), "The TLS handshake with localhost failed: closed by this side");
   ASSERT_TRUE(Testing::DrainIoThreads());
-  EXPECT_EQ(shaken.GetCalls(), 1);
+  EXPECT_EQ(handshake.GetCalls(), 1);
 }
 
-TEST(SSLStream, ClosingEndsPendingReadsAndWritesOnce) {
+TEST(SSLStream, EndsPendingReadsAndWritesOnceWhenItIsClosed) {
   ScriptedServer server(
       [](ServerConnection &connection) {
-        connection.ShakeHands();
+        connection.Handshake();
         connection.WaitForInterrupt();
       },
       TlsSettings());
   TlsClient client(CreateTrustingContext(), server.GetPort());
-  ASSERT_EQ(client.ShakeHands(), "");
+  ASSERT_EQ(client.Handshake(), "");
   char buffer[16];
   const std::string message(64u << 20, 'x');
   Completion read;
@@ -444,17 +451,17 @@ TEST(SSLStream, ClosingEndsPendingReadsAndWritesOnce) {
   EXPECT_EQ(written.GetCalls(), 1);
 }
 
-TEST(SSLStream, LeavesNoDescriptorBehindWhateverHappens) {
+TEST(SSLStream, LeaksNoDescriptorAndNoThread) {
   ScriptedServer server([](ServerConnection &connection) { connection.Stall(); }, TlsSettings());
   const Ref<SSLContext> context = CreateTrustingContext();
   const auto attempt = [&](int i) {
     TlsClient client(context, server.GetPort());
-    Completion shaken;
-    client.GetStream()->AsyncHandshake("localhost", i % 2 == 0 ? "bad" : "", shaken.ForEnd());
+    Completion handshake;
+    client.GetStream()->AsyncHandshake("localhost", i % 2 == 0 ? "bad" : "", handshake.ForEnd());
     if (i % 2 != 0) {
       client.GetStream()->Close();
     }
-    EXPECT_NE(shaken.GetMessage(), "");
+    EXPECT_NE(handshake.GetMessage(), "");
   };
   attempt(0);
   const auto settled = [&](std::size_t limit) {
@@ -471,26 +478,26 @@ TEST(SSLStream, LeavesNoDescriptorBehindWhateverHappens) {
   EXPECT_TRUE(Testing::Eventually([threads] { return Testing::CountThreads() <= threads; }));
 }
 
-TEST(SSLStream, OperationsBeforeTheHandshakeFail) {
+TEST(SSLStream, RefusesReadsAndWritesBeforeTheHandshake) {
   ScriptedServer server(Echo, TlsSettings());
   TlsClient client(CreateTrustingContext(), server.GetPort());
   EXPECT_EQ(client.Read(), "The TLS handshake has not been started");
   EXPECT_EQ(client.Write("x"), "The TLS handshake has not been started");
-  EXPECT_EQ(client.ShakeHands(), "");
-  EXPECT_EQ(client.ShakeHands(), "The TLS handshake was started before");
+  EXPECT_EQ(client.Handshake(), "");
+  EXPECT_EQ(client.Handshake(), "The TLS handshake was started before");
   EXPECT_EQ(client.Write("x"), "");
   EXPECT_EQ(client.Read(), "x");
 }
 
-TEST(SSLStream, ASecondReadOrWriteAtTheSameTimeIsRefused) {
+TEST(SSLStream, RefusesASecondReadAtTheSameTime) {
   ScriptedServer server(
       [](ServerConnection &connection) {
-        connection.ShakeHands();
+        connection.Handshake();
         connection.WaitForInterrupt();
       },
       TlsSettings());
   TlsClient client(CreateTrustingContext(), server.GetPort());
-  ASSERT_EQ(client.ShakeHands(), "");
+  ASSERT_EQ(client.Handshake(), "");
   char buffer[2];
   Completion first;
   Completion second;
@@ -502,25 +509,25 @@ TEST(SSLStream, ASecondReadOrWriteAtTheSameTimeIsRefused) {
   EXPECT_TRUE(first.FailedWith<SSLException>());
 }
 
-TEST(SSLStream, TheHostsErrorQueueIsNeitherReadNorChanged) {
+TEST(SSLStream, NeitherReadsNorChangesTheHostsErrorQueue) {
   ScriptedServer server(Echo, TlsSettings());
   ERR_clear_error();
   ERR_put_error(ERR_LIB_USER, 0, 77, "host.cpp", 1);
   const unsigned long left = ERR_peek_error();
   {
     TlsClient client(CreateTrustingContext(), server.GetPort());
-    EXPECT_EQ(client.ShakeHands(), "");
+    EXPECT_EQ(client.Handshake(), "");
     EXPECT_EQ(client.Write("hello"), "");
     EXPECT_EQ(client.Read(), "hello");
     client.GetStream()->Close();
     TlsClient refused(CreateTrustingContext(), server.GetPort());
-    EXPECT_NE(refused.ShakeHands("other.example"), "");
+    EXPECT_NE(refused.Handshake("other.example"), "");
   }
   EXPECT_EQ(ERR_get_error(), left);
   EXPECT_EQ(ERR_get_error(), 0u);
 }
 
-TEST(SSLStream, ManyConnectionsAtOnce) {
+TEST(SSLStream, ServesManyConnectionsAtOnce) {
   ScriptedServer server(Echo, TlsSettings());
   const Ref<SSLContext> context = CreateTrustingContext();
   std::vector<std::thread> threads;
@@ -529,7 +536,7 @@ TEST(SSLStream, ManyConnectionsAtOnce) {
     threads.emplace_back([&] {
       for (int i = 0; i < 10; ++i) {
         TlsClient client(context, server.GetPort());
-        right += client.ShakeHands().empty() && client.Write("hello").empty() && client.Read() == "hello";
+        right += client.Handshake().empty() && client.Write("hello").empty() && client.Read() == "hello";
         client.GetStream()->Close();
       }
     });
@@ -540,7 +547,7 @@ TEST(SSLStream, ManyConnectionsAtOnce) {
   EXPECT_EQ(right, 80);
 }
 
-/// Ends the process while handshakes go on. The server uses no OpenSSL, which would have to survive just the same.
+/// Ends the process during handshakes. The server uses no OpenSSL, so that only the clients' use of it is tested.
 void EndWhileBusy() {
   auto *const server = new ScriptedServer([](ServerConnection &connection) {
     connection.ReadRawSome();
@@ -552,9 +559,9 @@ void EndWhileBusy() {
     std::thread([context, port = server->GetPort()] {
       for (;; ++attempts) {
         try {
-          TlsClient(context, port).ShakeHands();
+          TlsClient(context, port).Handshake();
         } catch (const std::exception &) {
-          // The server resets connections at will.
+          // The server resets connections at any time.
         }
       }
     }).detach();
@@ -563,7 +570,7 @@ void EndWhileBusy() {
   std::exit(0);
 }
 
-TEST(SSLStreamDeathTest, TheProcessMayEndWhileHandshakesGoOn) {
+TEST(SSLStreamDeathTest, LetsTheProcessEndDuringHandshakes) {
   testing::FLAGS_gtest_death_test_style = "threadsafe";
   for (int i = 0; i < 20; ++i) {
     ASSERT_EXIT(EndWhileBusy(), testing::ExitedWithCode(0), "") << i;

@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// One TLS connection of ours to the scripted server, driven step by step.
+/// A client's TLS connection to the scripted server, driven step by step.
 
 #pragma once
 
@@ -30,10 +30,10 @@ inline Tarvel::Ref<Tarvel::Ssl::SSLContext> CreateTrustingContext() {
   return context;
 }
 
-/// Each step waits for its end, and gives the message of what went wrong.
+/// Each step waits for its end and returns the message of its failure; empty without one.
 class TlsClient {
 public:
-  /// Connects to the server, without a handshake yet.
+  /// Connects to the server, without a handshake.
   TlsClient(const Tarvel::Ref<Tarvel::Ssl::SSLContext> &context, int port) {
     const Tarvel::Ref<Tarvel::System::TcpClientSocket> socket = Tarvel::System::CreateTcpClientSocket();
     Completion connected;
@@ -46,7 +46,7 @@ public:
   TlsClient(const TlsClient &) = delete;
   TlsClient &operator=(const TlsClient &) = delete;
 
-  std::string ShakeHands(const std::string &host = "localhost", const std::string &parameter = "") {
+  std::string Handshake(const std::string &host = "localhost", const std::string &parameter = "") {
     m_handshake = Completion();
     m_stream->AsyncHandshake(host, parameter, m_handshake.ForEnd());
     return m_handshake.GetMessage();
@@ -59,7 +59,7 @@ public:
     return written.GetMessage();
   }
 
-  /// What came, empty at the end, or the message.
+  /// The bytes that were read, empty at the end of the connection; or the message of the failure.
   std::string Read() {
     std::string bytes(65536, '\0');
     Completion read;

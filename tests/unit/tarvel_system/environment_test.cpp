@@ -1,7 +1,8 @@
 // SPDX-License-Identifier: Apache-2.0
 
-#include <tarvel/system/environment.h>
+#include <tarvel/core/environment.h>
 
+#include <tarvel/core/environment.h>
 #include <tarvel/core/string_util.h>
 #include <tarvel/system/date_time.h>
 
@@ -9,24 +10,29 @@
 
 #include <limits>
 #include <thread>
+#include <type_traits>
 
 namespace Tarvel::System {
 namespace {
 
-/// Later than any clock that this test can run under is likely to be.
+static_assert(std::is_same_v<System::Environment, Tarvel::Environment> &&
+                  std::is_same_v<ScopedEnvironment, Tarvel::ScopedEnvironment>,
+              "the former names still work");
+
+/// Later than the clock of any machine that runs this test.
 constexpr std::int64_t YEAR_3000 = 32'503'680'000'000'000;
 
 Environment Clock(std::int64_t now) {
   return {[now] { return now; }, nullptr};
 }
 
-TEST(ScopedEnvironment, PutsItsClockAndUuidSourceInPlace) {
+TEST(ScopedEnvironment, ReplacesTheClockAndTheUuidSource) {
   const ScopedEnvironment scope({[] { return std::int64_t{1'000'000}; }, [] { return std::string("uuid-1"); }});
   EXPECT_EQ(GetUtcDateTime().ToString(), "1970-01-01T00:00:01.000Z");
   EXPECT_EQ(StringUtil::GenerateUuid(), "uuid-1");
 }
 
-TEST(ScopedEnvironment, GivesTheRealSourcesBackAtItsEnd) {
+TEST(ScopedEnvironment, RestoresTheRealSourcesAtItsEnd) {
   {
     const ScopedEnvironment scope({[] { return std::int64_t{0}; }, [] { return std::string("uuid-1"); }});
   }
@@ -43,14 +49,14 @@ TEST(ScopedEnvironment, Nests) {
   EXPECT_EQ(GetUtcDateTime().GetUtcTime(), 1);
 }
 
-TEST(ScopedEnvironment, MeansTheRealSourceByAnEmptyFunctionAlsoInsideAnotherScope) {
+TEST(ScopedEnvironment, UsesTheRealSourceForAnEmptyFunctionAlsoInsideAnotherScope) {
   const ScopedEnvironment outer({[] { return YEAR_3000; }, [] { return std::string("outer"); }});
   const ScopedEnvironment inner{Environment{}};
   EXPECT_LT(GetUtcDateTime().GetUtcTime(), YEAR_3000);
   EXPECT_EQ(StringUtil::GenerateUuid().size(), 36U);
 }
 
-TEST(ScopedEnvironment, HoldsOnEveryThread) {
+TEST(ScopedEnvironment, AppliesToEveryThread) {
   const ScopedEnvironment scope(Clock(42));
   std::int64_t seen = 0;
   std::thread([&] { seen = GetUtcDateTime().GetUtcTime(); }).join();

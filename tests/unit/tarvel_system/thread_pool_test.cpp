@@ -137,9 +137,10 @@ TEST(ThreadPool, LogsAnExceptionAndEndsThatItemOnly) {
   root->SetSink(nullptr);
   const std::string start = "Tarvel/8/An exception left a work item of the thread pool: ";
   const std::lock_guard<std::mutex> lock(mutex);
-  EXPECT_EQ(lines, (std::vector<std::string>{
-                       start + "Tarvel::InvalidStateException: too early", start + "std::runtime_error: of the library",
-                       start + "an object that is no exception", start + "std::bad_function_call: bad_function_call"}));
+  EXPECT_EQ(lines, (std::vector<std::string>{start + "Tarvel::InvalidStateException: too early",
+                                             start + "std::runtime_error: of the library",
+                                             start + "an object that is not a std::exception",
+                                             start + "std::bad_function_call: bad_function_call"}));
 }
 
 TEST(ThreadPool, ACancelledItemNeverBegins) {

@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// `CheckedCast`, the downcast of a counted reference that says so when the class is wrong.
+/// `CheckedCast`, a downcast of a counted reference that throws when the class is wrong.
 
 #pragma once
 

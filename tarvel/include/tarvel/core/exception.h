@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// The root of every exception that the platform and the client raise, and the platform's general exceptions.
+/// The root of every exception that the platform and the client throw, and the platform's general exceptions.
 
 #pragma once
 
@@ -15,6 +15,7 @@ namespace Tarvel {
 /// A message text and the call stack at the place where the exception was made.
 class TARVEL_API Exception : public std::exception {
 public:
+  /// An exception with the message and the current call stack.
   explicit Exception(const std::string &message);
   Exception(const Exception &) noexcept;
   Exception &operator=(const Exception &) noexcept;
@@ -23,7 +24,7 @@ public:
   /// The message; valid as long as the exception. Never null.
   const char *what() const noexcept override;
 
-  /// The call stack at construction, one frame a line, as far as symbols are to be had. Costly: for diagnosis only.
+  /// The call stack at construction, one frame a line, symbolised where possible. Slow: for diagnostics only.
   virtual std::string GetBacktrace() const;
 
   /// Class, message and call stack in one text, for a diagnostic dump.
@@ -32,14 +33,18 @@ public:
   /// The innermost frame of the call stack that is not the exception's own; empty when unknown.
   virtual std::string Where() const;
 
-  /// A new copy of the same dynamic class, owned by the caller. It may be handed to another thread.
+  /// A new copy of the same dynamic class. The caller owns it and deletes it; `Copy` returns an owner instead. It may be handed
+  /// to another thread.
   virtual Exception *Clone() const;
 
-  /// Raises a copy as its own dynamic class, so that a holder of a base reference rethrows the precise type.
+  /// What `Clone` returns, with an owner that deletes it. Use this to keep an exception that is valid only during a call.
+  std::unique_ptr<Exception> Copy() const;
+
+  /// Throws a copy as its own dynamic class, so that a holder of a base reference rethrows the precise type.
   [[noreturn]] virtual void Throw() const;
 
 protected:
-  /// Without message and call stack, and so without memory: for a class that has a `what` of its own.
+  /// Has no message and no call stack, and so needs no memory: for a class that defines its own `what`.
   Exception() noexcept;
 
 private:
@@ -67,9 +72,10 @@ public:                                                                         
     throw *this;                                                                                                       \
   }
 
-/// A bad argument. The message is "Invalid argument : " followed by the detail that the constructor is given.
+/// An invalid argument. The message is "Invalid argument : " followed by the constructor's `detail`.
 class TARVEL_API InvalidArgumentException : public Exception {
 public:
+  /// An exception whose message ends with `detail`.
   explicit InvalidArgumentException(const std::string &detail);
   InvalidArgumentException(const InvalidArgumentException &) noexcept = default;
   InvalidArgumentException &operator=(const InvalidArgumentException &) noexcept = default;
@@ -78,8 +84,9 @@ public:
   [[noreturn]] void Throw() const override;
 };
 
-/// An operation on an object that is not in the state for it. Also whatever needs OpenSSL once it has cleaned itself up, with
-/// the message "OpenSSL has cleaned itself up: the process is about to end": that is no verdict on anything, either.
+/// An operation on an object that is not in the state for it. Also any operation that needs OpenSSL after OpenSSL has cleaned
+/// itself up, with the message "OpenSSL has cleaned itself up: the process is about to end"; this says nothing about the data
+/// that the operation was given.
 class TARVEL_API InvalidStateException : public Exception {
   TARVEL_EXCEPTION_BODY(InvalidStateException, Exception);
 };
@@ -89,7 +96,7 @@ class TARVEL_API TypeMismatchException : public Exception {
   TARVEL_EXCEPTION_BODY(TypeMismatchException, Exception);
 };
 
-/// Text that is not Base64 (RFC 4648, section 4; XML white space allowed between characters).
+/// Text that is not Base64 (RFC 4648, section 4; XML white space is allowed between characters).
 class TARVEL_API Base64FormatException : public Exception {
   TARVEL_EXCEPTION_BODY(Base64FormatException, Exception);
 };
@@ -99,15 +106,16 @@ class TARVEL_API DateTimeFormatException : public Exception {
   TARVEL_EXCEPTION_BODY(DateTimeFormatException, Exception);
 };
 
-/// Memory that ran out in OpenSSL, in any function that uses it, or after the start of an operation over HTTP or TLS, whose
-/// completion gets it. (Elsewhere a call raises `std::bad_alloc`.) It says nothing about what was being read, verified or
-/// sent. The message is always "There is not enough memory"; there is no call stack.
+/// Memory ran out in OpenSSL, in any function that uses it, or after the start of an operation over HTTP or TLS, whose
+/// completion gets this exception. (Elsewhere a call throws `std::bad_alloc`.) It says nothing about the data that was being
+/// read, verified or sent. The message is always "There is not enough memory"; there is no call stack.
 class TARVEL_API OutOfMemoryException : public Exception {
 public:
   OutOfMemoryException() noexcept = default;
   OutOfMemoryException(const OutOfMemoryException &) noexcept = default;
   OutOfMemoryException &operator=(const OutOfMemoryException &) noexcept = default;
   ~OutOfMemoryException() override;
+  /// Always "There is not enough memory".
   const char *what() const noexcept override;
   OutOfMemoryException *Clone() const override;
   [[noreturn]] void Throw() const override;

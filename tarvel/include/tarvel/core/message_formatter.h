@@ -12,11 +12,12 @@
 
 namespace Tarvel {
 
-/// One argument of a message, as text. A type takes part by an overload of `FormatMessageArgument` in its own namespace,
-/// found by argument-dependent look-up, that returns `std::string`; texts, numbers, Booleans ("true", "false") and
-/// pointers (hexadecimal, "(null)" when null) are known already.
+/// One argument of a message, as text. To make a type usable as an argument, define an overload of `FormatMessageArgument` in
+/// its own namespace, which is found by argument-dependent look-up and returns `std::string`. Texts, numbers, Booleans
+/// ("true", "false") and pointers (hexadecimal, "(null)" when null) have theirs already.
 namespace MessageArguments {
 
+/// The text of an argument of a message.
 TARVEL_API std::string FormatMessageArgument(bool value);
 TARVEL_API std::string FormatMessageArgument(char value);
 TARVEL_API std::string FormatMessageArgument(long long value);
@@ -26,6 +27,7 @@ TARVEL_API std::string FormatMessageArgument(const char *value);
 TARVEL_API std::string FormatMessageArgument(const void *value);
 TARVEL_API std::string FormatMessageArgument(std::string_view value);
 
+/// The text of an argument of any type that has a `FormatMessageArgument`.
 template <typename T>
 std::string ToText(const T &value) {
   if constexpr (std::is_same_v<T, bool> || std::is_same_v<T, char>) {
@@ -55,7 +57,7 @@ public:
   MessageFormatter() = delete;
 
   /// `format` with %1 to %9 replaced by the arguments in order. A placeholder without an argument stays as it is, "%%" is
-  /// one per cent sign, and text that comes from an argument is never read as a format again.
+  /// one per cent sign, and placeholders within an argument are not replaced.
   template <typename... Args>
   static std::string ASPrint(std::string_view format, const Args &...args) {
     static_assert(sizeof...(Args) <= 9, "a message has the placeholders %1 to %9");

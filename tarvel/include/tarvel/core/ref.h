@@ -21,8 +21,10 @@ public:
   Object(const Object &) = delete;
   Object &operator=(const Object &) = delete;
 
+  /// Adds one to the count.
   void AddRef() const noexcept { m_references.fetch_add(1, std::memory_order_relaxed); }
 
+  /// Subtracts one from the count, and destroys the object at 0.
   void Release() const noexcept {
     if (m_references.fetch_sub(1, std::memory_order_acq_rel) == 1) {
       delete this;
@@ -38,12 +40,14 @@ private:
 };
 
 /// A counted reference to a `T` that has `AddRef` and `Release` (an `Object`, or a node of an XML tree). May be null.
-/// Copying shares, destroying releases. One `Ref` is for one thread at a time; copies may live on any thread.
+/// Copying shares the object, destroying releases it. One `Ref` is for one thread at a time; copies may be used on any thread.
 template <typename T>
 class Ref {
 public:
+  /// The type of the object.
   using element_type = T;
 
+  /// The null reference.
   constexpr Ref() noexcept = default;
   constexpr Ref(std::nullptr_t) noexcept {}
 
@@ -57,9 +61,11 @@ public:
   Ref(const Ref &other) noexcept : Ref(other.m_object) {}
   Ref(Ref &&other) noexcept : m_object(std::exchange(other.m_object, nullptr)) {}
 
+  /// Shares the object of `other`, for example as its base class.
   template <typename U, typename = std::enable_if_t<std::is_convertible_v<U *, T *>>>
   Ref(const Ref<U> &other) noexcept : Ref(other.get()) {}
 
+  /// Takes over the reference of `other`, which becomes null.
   template <typename U, typename = std::enable_if_t<std::is_convertible_v<U *, T *>>>
   Ref(Ref<U> &&other) noexcept : m_object(other.Detach()) {}
 
@@ -74,20 +80,26 @@ public:
     return *this;
   }
 
+  /// The object, or null. It is valid while there is a reference to it.
   T *get() const noexcept { return m_object; }
+  /// The object, which must not be null.
   T &operator*() const noexcept { return *m_object; }
   T *operator->() const noexcept { return m_object; }
+  /// Whether the reference is not null.
   explicit operator bool() const noexcept { return m_object != nullptr; }
 
+  /// Releases the object; the reference becomes null.
   void reset() noexcept { *this = Ref(); }
 
-  /// Gives the reference up without releasing it: the caller owns one count from here on.
+  /// Gives up the reference without releasing it: the caller owns one count from then on.
   [[nodiscard]] T *Detach() noexcept { return std::exchange(m_object, nullptr); }
 
+  /// Whether both refer to the same object.
   template <typename U>
   friend bool operator==(const Ref &left, const Ref<U> &right) noexcept {
     return left.get() == right.get();
   }
+  /// Whether they refer to different objects.
   template <typename U>
   friend bool operator!=(const Ref &left, const Ref<U> &right) noexcept {
     return left.get() != right.get();
@@ -103,7 +115,7 @@ Ref<T> MakeRef(Args &&...args) {
   return Ref<T>(new T(std::forward<Args>(args)...));
 }
 
-/// Raises `TypeMismatchException` naming the expected and the actual class.
+/// Throws `TypeMismatchException`; the message contains the expected and the actual class.
 [[noreturn]] TARVEL_API void ThrowTypeMismatch(const char *expected, const char *actual);
 
 } // namespace Tarvel

@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// `SecureWipe`, which overwrites a secret before its memory goes back to the heap.
+/// `SecureWipe`, which overwrites a secret before its memory is freed.
 
 #pragma once
 
@@ -13,11 +13,10 @@
 
 namespace Tarvel {
 
-/// Overwrites `length` bytes at `data` with zeros, in a way that no compiler leaves out. `data` may be null when `length`
-/// is 0.
+/// Overwrites `length` bytes at `data` with zeros; no compiler optimises this away. `data` may be null when `length` is 0.
 TARVEL_API void SecureWipe(void *data, std::size_t length) noexcept;
 
-/// Overwrites the text, and whatever an earlier, longer value left behind it in the same memory, and makes it empty.
+/// Overwrites the text and the rest of its memory, in which an earlier, longer value may remain, and makes the text empty.
 TARVEL_API void SecureWipe(std::string &text) noexcept;
 
 /// The same for a list of bytes.

@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// Letter case, lengths fit for a message, Base64 and UUID texts.
+/// Letter case, shortening for messages, Base64 and UUID texts.
 
 #pragma once
 
@@ -14,48 +14,48 @@
 
 namespace Tarvel {
 
-/// Text helpers of the platform. All are free of state and of the process's locale, and safe on any thread.
+/// Text functions of the platform. They keep no state, ignore the process's locale, and are safe on any thread.
 class TARVEL_API StringUtil {
 public:
   StringUtil() = delete;
 
-  /// The upper-case form of UTF-8 text by Unicode's simple case mapping (one character to one character), as the C
-  /// library's locale C.UTF-8 has it; on a system without that locale only ASCII letters are mapped. Bytes that are not
+  /// The upper-case form of UTF-8 text by Unicode's simple case mapping (one character to one character), as
+  /// defined by the C library's locale C.UTF-8; on a system without that locale only ASCII letters are mapped. Bytes that are not
   /// UTF-8 stay as they are.
   static std::string ToUpper(std::string_view text);
 
-  /// The lower-case form, likewise.
+  /// The lower-case form, by the same rules.
   static std::string ToLower(std::string_view text);
 
-  /// How much of a value a message holds, in bytes.
+  /// The most bytes of a value that a message contains.
   static constexpr std::size_t MAX_VALUE_BYTES = 1024;
 
-  /// How long a line of a log or on a terminal may be, in bytes.
+  /// The maximum length of a line in a log or on a terminal, in bytes.
   static constexpr std::size_t MAX_LINE_BYTES = 7 * 1024;
 
-  /// `text` as a message may show it: whole when it has at most `most` bytes. Of a longer one that many bytes, or up to
-  /// three fewer so as not to part a UTF-8 character, then "... (N more bytes)".
+  /// `text` in the form for messages: all of it when it has at most `most` bytes; otherwise its first `most` bytes, or up to
+  /// three fewer so that no UTF-8 character is split, then "... (N more bytes)".
   static std::string Shorten(std::string_view text, std::size_t most = MAX_VALUE_BYTES);
 
   /// A new random UUID (RFC 4122, version 4) as 36 lower-case characters, from the system's random source, or from the
-  /// source that `System::ScopedEnvironment` put in its place.
+  /// source of a `ScopedEnvironment`.
   static std::string GenerateUuid();
 
   /// Base64 (RFC 4648, section 4) with padding and without line breaks.
   static std::string Base64Encode(const std::uint8_t *data, std::size_t length);
   static std::string Base64Encode(const std::vector<std::uint8_t> &data);
 
-  /// The bytes of Base64 text. XML white space (tab, line feed, carriage return, blank) may stand anywhere.
+  /// The bytes of Base64 text. XML white space (tab, line feed, carriage return, blank) is allowed anywhere.
   /// @throws Base64FormatException for any other character, wrong or misplaced padding, padding bits that are not zero, or
   ///         a length that no encoding has.
   static std::vector<std::uint8_t> Base64Decode(std::string_view text);
 };
 
-/// How many characters `Base64_Encode` writes for `length` bytes, without a terminator.
+/// The number of characters that `Base64_Encode` writes for `length` bytes, without a terminator.
 TARVEL_API std::size_t Base64_EncodedLength(std::size_t length);
 
-/// Writes the Base64 form of `length` bytes at `data` to `out`, which has room for `Base64_EncodedLength(length)`
-/// characters. Returns the number of characters written; nothing is terminated.
+/// Writes the Base64 form of `length` bytes at `data` to `out`, which must have space for `Base64_EncodedLength(length)`
+/// characters. Returns the number of characters written; no terminator is written.
 TARVEL_API std::size_t Base64_Encode(const std::uint8_t *data, std::size_t length, char *out);
 
 } // namespace Tarvel

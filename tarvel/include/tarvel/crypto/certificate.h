@@ -17,10 +17,9 @@
 
 namespace Tarvel::Crypto {
 
-/// Something wrong with a certificate, a key or a file that holds them; the message says what and where, with the
-/// cryptographic library's own words. All that uses that library can also raise two exceptions that say nothing about what it
-/// was given: `InvalidStateException` when the library has cleaned itself up because the process ends, and
-/// `OutOfMemoryException`.
+/// A certificate, a key or a file that contains them is not valid; the message says what is wrong and where, and includes
+/// OpenSSL's own text. Every function that uses OpenSSL may also throw two exceptions that say nothing about its input:
+/// `InvalidStateException` when OpenSSL has cleaned itself up because the process is ending, and `OutOfMemoryException`.
 class TARVEL_API CryptoException : public Exception {
   TARVEL_EXCEPTION_BODY(CryptoException, Exception);
 };
@@ -31,13 +30,14 @@ public:
   /// The DER encoding; owned by the certificate.
   virtual const std::vector<std::uint8_t> &GetDer() const noexcept = 0;
 
-  /// The subject's and the issuer's distinguished name as RFC 2253 writes it, as "CN=sts,O=Example".
+  /// The subject's and the issuer's distinguished name in the form of RFC 2253, such as "CN=sts,O=Example".
   virtual std::string GetSubject() const = 0;
   virtual std::string GetIssuer() const = 0;
 
   /// SHA-256 over the DER encoding, 64 lower-case hexadecimal digits.
   virtual std::string GetSha256Thumbprint() const = 0;
 
+  /// The first and the last moment at which the certificate is valid.
   virtual System::DateTime GetNotBefore() const = 0;
   virtual System::DateTime GetNotAfter() const = 0;
 
@@ -48,23 +48,24 @@ protected:
   ~Certificate() override;
 };
 
+/// Certificates in order. Elements may be null only where a comment says so.
 using CertificateList = std::vector<Ref<const Certificate>>;
 
-/// The certificate in DER form at `data`, all `length` bytes of it.
-/// @throws CryptoException when it does not decode, or bytes follow it.
+/// Decodes the certificate in DER form that the `length` bytes at `data` contain.
+/// @throws CryptoException when it does not decode, or further bytes follow it.
 TARVEL_API Ref<const Certificate> CreateCertificateFromDer(const std::uint8_t *data, std::size_t length);
 
 /// The first certificate in PEM text.
-/// @throws CryptoException when there is none, or it does not decode.
+/// @throws CryptoException when there is no certificate, or it does not decode.
 TARVEL_API Ref<const Certificate> CreateCertificateFromPem(std::string_view pem);
 
 /// All certificates of PEM text, in order: at least one.
-/// @throws CryptoException when there is none, one does not decode, or the text holds a private key.
+/// @throws CryptoException when there is no certificate, one does not decode, or the text contains a private key.
 TARVEL_API CertificateList CreateCertificatesFromPem(std::string_view pem);
 
 /// All certificates of a file: PEM, or one in DER.
 /// @throws IOException when the file cannot be read.
-/// @throws CryptoException as above; the message begins with the path.
+/// @throws CryptoException as `CreateCertificatesFromPem` does; the message begins with the path.
 TARVEL_API CertificateList LoadCertificates(const std::string &path);
 
 } // namespace Tarvel::Crypto

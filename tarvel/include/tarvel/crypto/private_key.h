@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// Private keys, and key stores that hold them with their certificates.
+/// Private keys, and key stores that contain them with their certificates.
 
 #pragma once
 
@@ -24,12 +24,12 @@ class TARVEL_API NoKeyException : public CryptoException {
   TARVEL_EXCEPTION_BODY(NoKeyException, CryptoException);
 };
 
-/// A private key that is not the one of the certificate it was given with.
+/// A private key that does not belong to the certificate it was given with.
 class TARVEL_API KeyMismatchException : public CryptoException {
   TARVEL_EXCEPTION_BODY(KeyMismatchException, CryptoException);
 };
 
-/// An RSA or EC private key. Secret: it cannot be printed, and its memory is wiped when the last reference goes.
+/// An RSA or EC private key. Secret: it cannot be printed, and its memory is wiped when the last reference is released.
 /// Immutable; safe on any thread.
 class TARVEL_API PrivateKey : public Object {
 public:
@@ -42,36 +42,36 @@ protected:
   ~PrivateKey() override;
 };
 
-/// Asked for the passphrase of an encrypted key, on the calling thread, at most once a call; the text is wiped after use. It
-/// may take its time.
-/// An empty function means that there is none.
+/// Returns the passphrase of an encrypted key. Called on the calling thread, at most once per call; it may block. The text is
+/// wiped after use. An empty function means that there is no passphrase.
 using PassphraseCallback = std::function<std::string()>;
 
 /// The first private key in PEM text (PKCS#8, plain or encrypted, or the traditional forms) or in DER.
-/// @throws NoKeyException when there is none. @throws WrongPassphraseException when it is encrypted and the passphrase is
-/// missing or wrong. @throws CryptoException when it does not decode, or is neither RSA nor EC.
+/// @throws NoKeyException when there is no private key. @throws WrongPassphraseException when it is encrypted and the
+/// passphrase is missing or wrong. @throws CryptoException when it does not decode, or is neither RSA nor EC.
 TARVEL_API Ref<const PrivateKey> CreatePrivateKey(std::string_view text, const PassphraseCallback &passphrase = {});
 
-/// The private key in a file, or in the store that an URI names ("file:…"; after `UseSystemConfiguration` also what the
-/// machine's providers load, such as "pkcs11:…").
-/// @throws IOException when a file cannot be read; else as `CreatePrivateKey`, the message beginning with the path.
+/// The private key in a file, or in the store that a URI refers to ("file:…"; after `UseSystemConfiguration` also the URIs
+/// of the machine's providers, such as "pkcs11:…").
+/// @throws IOException when a file cannot be read. Otherwise throws what `CreatePrivateKey` throws, with a message that
+/// begins with the path.
 TARVEL_API Ref<const PrivateKey> LoadPrivateKey(const std::string &pathOrUri,
                                                 const PassphraseCallback &passphrase = {});
 
-/// A private key, its certificate, and the further certificates that a store holds.
+/// A private key, its certificate, and the other certificates of a key store.
 struct KeyStore {
-  Ref<const PrivateKey> privateKey;
-  Ref<const Certificate> certificate;
-  CertificateList others;
+  Ref<const PrivateKey> privateKey;   ///< never null
+  Ref<const Certificate> certificate; ///< of the key; never null
+  CertificateList others;             ///< in the order of the store
 };
 
-/// What a PKCS#12 file (RFC 7292) holds.
-/// @throws as `CreatePrivateKey`; `CryptoException` also when there is no certificate for the key.
+/// Reads a key store in PKCS#12 form (RFC 7292).
+/// @throws what `CreatePrivateKey` throws; `CryptoException` also when there is no certificate for the key.
 TARVEL_API KeyStore CreateKeyStoreFromPkcs12(std::string_view der, const PassphraseCallback &passphrase);
 
-/// What a PKCS#12 file at `path` holds.
-/// @throws IOException when the file cannot be read; else as `CreateKeyStoreFromPkcs12`, the message beginning with the
-/// path.
+/// Reads the PKCS#12 file at `path`.
+/// @throws IOException when the file cannot be read. Otherwise throws what `CreateKeyStoreFromPkcs12` throws, with a message
+/// that begins with the path.
 TARVEL_API KeyStore LoadKeyStore(const std::string &path, const PassphraseCallback &passphrase);
 
 /// @throws KeyMismatchException unless `key` is the private key of `certificate`.

@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// Whether the machine's configuration of OpenSSL counts for this library.
+/// Applying the machine's configuration of OpenSSL to this library.
 
 #pragma once
 
@@ -9,15 +9,15 @@
 namespace Tarvel::Crypto {
 
 /// From now on, certificates, keys, signatures and TLS use OpenSSL as the machine has configured it: `openssl.cnf`, or the
-/// file that the environment variable OPENSSL_CONF names, with its providers (FIPS, PKCS#11, TPM), its properties and its TLS
-/// settings. Without this call nothing of that is read, and nothing of it counts, also when the host program has it loaded.
+/// file in the environment variable OPENSSL_CONF, with its providers (FIPS, PKCS#11, TPM), its properties and its TLS settings.
+/// Without this call, that configuration is neither read nor applied, even if the host has loaded it.
 ///
-/// TLS then offers what both the machine and this library allow: a higher minimum version, a higher security level and a
-/// shorter list of cipher suites stay as the machine has them, and TLS 1.2, level 2 and forward secrecy stay required.
+/// TLS then offers what both the machine and this library allow: the machine may set a higher minimum version, a higher
+/// security level or a shorter list of cipher suites; TLS 1.2, level 2 and forward secrecy remain required.
 ///
-/// To be called before the first certificate, key, signature, token or TLS context. Any number of times, on any thread.
-/// @throws InvalidStateException when it comes too late, or when OpenSSL has cleaned itself up.
-/// @throws CryptoException when OpenSSL refuses the configuration. By default it passes over what it cannot load;
+/// Call this before the first certificate, key, signature, token or TLS context. Any number of times, on any thread.
+/// @throws InvalidStateException when it is called too late, or when OpenSSL has cleaned itself up.
+/// @throws CryptoException when OpenSSL refuses the configuration. By default OpenSSL skips what it cannot load;
 ///         `config_diagnostics = 1` in the file makes it strict.
 /// @throws OutOfMemoryException
 TARVEL_API void UseSystemConfiguration();

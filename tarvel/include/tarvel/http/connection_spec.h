@@ -19,26 +19,26 @@ namespace Tarvel::Http {
 class TARVEL_API ConnectionSpec : public Object {
 public:
   /// Called exactly once for each start that has not thrown, on an I/O thread, with the stream and null, or with an
-  /// exception, which is valid during the call; the stream may be given then too. It must not block, nor wait for another
+  /// exception, which is valid during the call; there may be a stream then too. It must not block, nor wait for another
   /// operation: start the next one from it.
   using ConnectCompletion = std::function<void(const Ref<System::Stream> &, const Exception *)>;
 
   /// One line for logs. The platform does not read it.
   virtual std::string ToString() const = 0;
 
-  /// The host that is asked, for the Host header and the cookies; an IPv6 address with or without brackets.
+  /// The host that requests go to, for the Host header and the cookies; an IPv6 address with or without brackets.
   virtual std::string GetHost() const = 0;
 
-  /// "host:port", for messages. The port, behind the last colon, goes into the Host header as well.
+  /// "host:port", for messages. The port, after the last colon, is also used for the Host header.
   virtual std::string GetEndpointString() const = 0;
 
-  /// Whether a connection may serve on after an authentication has failed on it. The user agent here, which opens one
-  /// connection for each request, does not ask.
+  /// Whether a connection may be used again after an authentication has failed on it. The platform's user agent, which
+  /// opens one connection for each request, does not call this.
   virtual bool IsReuseOnAuthErrorSupported() const = 0;
 
-  /// Starts to connect. The returned item cancels the attempt; the completion then gets an exception. What goes wrong
-  /// is for the completion, as a rule in a `System::NetworkException`, of which `Ssl::SSLException` is one; an
-  /// `OutOfMemoryException` when memory ran out, an `InvalidStateException` with the text of a foreign exception.
+  /// Starts to connect. The returned item cancels the attempt; the completion then gets an exception. Failures are
+  /// reported to the completion: usually as a `System::NetworkException`, such as an `Ssl::SSLException`; as an
+  /// `OutOfMemoryException` when memory ran out; as an `InvalidStateException` with the text of a foreign exception.
   /// @throws InvalidStateException when there is no I/O thread that could call the completion, and none can be started;
   ///         `std::bad_alloc`. The completion is not called then.
   virtual Ref<System::ScheduledItem> AsyncConnect(ConnectCompletion completion) const = 0;

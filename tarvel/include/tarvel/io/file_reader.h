@@ -11,12 +11,12 @@
 
 namespace Tarvel {
 
-/// A reader over the file at `path`, opened now and closed with the reader. Reading blocks as the file does.
-/// @throws IOException when the file cannot be opened; the message names it and the system's reason.
+/// A reader over the file at `path`, which is opened now and closed with the reader. `Read` blocks when reading the file does.
+/// @throws IOException when the file cannot be opened; the message contains the path and the system's reason.
 TARVEL_API Ref<Reader> OpenFile(const std::string &path);
 
-/// A reader over `descriptor`, from where it stands. The descriptor stays the caller's, is never closed here and must
-/// stay open as long as the reader is read.
+/// A reader over `descriptor`, from its current position. The caller keeps the descriptor, closes it, and leaves it open as
+/// long as the reader is used.
 TARVEL_API Ref<Reader> CreateDescriptorReader(int descriptor);
 
 } // namespace Tarvel

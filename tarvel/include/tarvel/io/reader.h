@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// `Reader`, a stream of bytes to read, and the reader over a text.
+/// `Reader`, a stream of bytes to read, and a reader over a text.
 
 #pragma once
 
@@ -19,20 +19,20 @@ public:
   /// @throws IOException when the source fails.
   virtual std::size_t Read(char *buffer, std::size_t length) = 0;
 
-  /// Everything from here to the end. The reader stands at its end afterwards.
-  /// @param maximumBytes reading stops as soon as more than this is there; the result then holds at least one byte more.
+  /// Everything from the current position to the end.
+  /// @param maximumBytes reading stops as soon as it has read more than this; the result is then at least one byte longer.
   /// @throws IOException when the source fails.
   virtual std::string ReadToEnd(std::size_t maximumBytes);
 
-  /// The charset that the source declares for its bytes, as it is written there ("windows-1252"); empty when it declares
-  /// none. For messages only: what the reader could make UTF-8 of is UTF-8 already.
+  /// The charset that the source declares for its bytes, in its own spelling ("windows-1252"); empty when it declares none.
+  /// For messages only: text that the reader can convert to UTF-8 has been converted already.
   virtual std::string GetDeclaredCharset() const;
 
 protected:
   ~Reader() override;
 };
 
-/// A reader over `text`, which it keeps, and overwrites when it is destroyed.
+/// A reader over `text`, which it owns, and overwrites when it is destroyed.
 TARVEL_API Ref<Reader> CreateStringReader(std::string text);
 
 } // namespace Tarvel

@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// `Writer`, a stream of bytes to write, and the writer that gathers a text.
+/// `Writer`, a stream of bytes to write, and a writer that collects a text.
 
 #pragma once
 
@@ -12,7 +12,7 @@
 
 namespace Tarvel {
 
-/// A stream that takes bytes in order. For one thread at a time.
+/// A stream that accepts bytes in order. For one thread at a time.
 class TARVEL_API Writer : public Object {
 public:
   /// Appends `bytes`, all of them.
@@ -22,13 +22,14 @@ protected:
   ~Writer() override;
 };
 
-/// A writer that keeps what is written.
+/// A writer that collects what is written, and overwrites it when it is destroyed.
 class TARVEL_API StringWriter : public Writer {
 public:
   /// What has been written so far; valid until the next write.
   virtual const std::string &GetText() const = 0;
 
-  /// Hands out what has been written and starts again from nothing.
+  /// Returns what has been written and starts again with an empty text. The caller owns the text, and overwrites it if it is
+  /// secret.
   virtual std::string TakeText() = 0;
 
 protected:

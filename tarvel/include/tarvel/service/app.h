@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// The application object: what the host process offers to the platform.
+/// The application object: what the host process provides for the platform.
 
 #pragma once
 
@@ -9,7 +9,7 @@
 
 namespace Tarvel::Service {
 
-/// The process's one application object.
+/// The single application object of the process.
 class TARVEL_API App {
 public:
   App(const App &) = delete;

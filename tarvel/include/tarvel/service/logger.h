@@ -17,20 +17,20 @@ namespace Tarvel::Service {
 
 /// One line for the sink. The texts are valid during the call only.
 struct LogRecord {
-  std::string_view logger; ///< the logger's name
-  int level;               ///< the line's level: the higher, the finer
-  std::string_view message;
+  std::string_view logger;  ///< the logger's name
+  int level;                ///< the line's level: the higher, the more detailed
+  std::string_view message; ///< the text of the line
 };
 
-/// What the host does with a line. Called on the thread that logs, possibly on several at once; an exception that leaves
-/// it is swallowed.
+/// The host's function for one line. Called on the thread that logs, possibly on several at once; an exception that leaves
+/// it is ignored.
 using LogSink = std::function<void(const LogRecord &)>;
 
-/// The root of all loggers: it holds the host's sink. One exists, in the `App`.
+/// The root of all loggers, which has the host's sink. There is one, in the `App`.
 class TARVEL_API LogRoot : public Object {
 public:
-  /// Installs the sink, in place of any earlier one; an empty function removes it. Lines that are being written on other
-  /// threads may still reach the earlier sink.
+  /// Installs the sink, which replaces any earlier one; an empty function removes it. Lines that other threads are writing
+  /// at that moment may still reach the earlier sink.
   virtual void SetSink(LogSink sink) = 0;
 
   /// Hands `record` to the sink, if there is one. Never throws.
@@ -46,13 +46,15 @@ protected:
 /// A named source of log lines. Safe on any thread.
 class TARVEL_API Logger : public Object {
 public:
-  /// A logger of that name on `root` that lets lines of up to `level` through.
+  /// A logger of that name on `root` that writes lines of up to `level`.
   static Ref<Logger> CreateLogger(const Ref<LogRoot> &root, std::string name, int level);
 
+  /// The name that the logger was made with.
   virtual const std::string &GetName() const noexcept = 0;
 
-  /// The finest level that is let through; one atomic load. A line of level n is written when this is at least n.
+  /// The highest level that is written; one atomic load. A line of level n is written when this is at least n.
   int GetLevel() const noexcept { return m_level.load(std::memory_order_relaxed); }
+  /// Sets it; other threads see the change soon.
   void SetLevel(int level) noexcept { m_level.store(level, std::memory_order_relaxed); }
 
   /// Writes one line, whatever its level; callers test `GetLevel` first. Never throws.
@@ -66,7 +68,7 @@ private:
   std::atomic<int> m_level;
 };
 
-/// Writes `message`, with the arguments in %1 to %9, as one line of `logger` when its level lets it through.
+/// Writes `message`, with the arguments in %1 to %9, as one line of `logger` if the logger's level is at least `level`.
 template <typename... Args>
 void LogInternal(Logger &logger, int level, std::string_view message, const Args &...args) {
   if (logger.GetLevel() < level) {

@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// TLS: what to trust, whom to be, and streams over it.
+/// TLS: what to trust, which certificate to present, and streams over TLS.
 
 #pragma once
 
@@ -16,7 +16,8 @@
 
 namespace Tarvel::Ssl {
 
-/// A failed handshake or a broken TLS connection; the message names the host and the reason in the TLS library's words.
+/// A failed handshake or a broken TLS connection. The message contains the host and the reason as the TLS library words
+/// it.
 class TARVEL_API SSLException : public System::NetworkException {
   TARVEL_EXCEPTION_BODY(SSLException, System::NetworkException);
 };
@@ -26,27 +27,31 @@ class TARVEL_API SSLStream : public System::Stream {
 public:
   /// Called once, on an I/O thread, with null or with what went wrong, which is valid during the call: an
   /// `SSLException`, also when the stream below failed; an `InvalidStateException` for a second handshake, and when OpenSSL has
-  /// cleaned itself up because the process ends; an `OutOfMemoryException`, which says nothing about the server. As
-  /// any completion of a stream, it must not block, nor wait for another operation: start the next one from it.
+  /// cleaned itself up because the process ends; an `OutOfMemoryException`, which says nothing about the server. Like
+  /// every completion of a stream, it must not block, nor wait for another operation: start the next one from it.
   using HandshakeHandler = std::function<void(const Exception *)>;
 
-  /// Shakes hands as a client. `host` is sent as the server name (unless it is an address) and the server's certificate
-  /// must be for it, and chain to what the context trusts.
+  /// Starts the client handshake. `host` is sent as the server name (unless it is an address). The server's certificate
+  /// must be for this host, and chain to what the context trusts.
   /// @param parameter empty, or the SHA-256 thumbprint that the server's certificate must have (64 hexadecimal digits,
-  ///        colons optional); it then stands in for the checks of chain and name. Any other text fails the handshake.
+  ///        colons optional); it then replaces the checks of chain and name. With any other text the handshake fails.
   virtual void AsyncHandshake(const std::string &host, const std::string &parameter, HandshakeHandler handler) = 0;
 
   /// After the handshake: whether an earlier session was resumed.
   virtual bool WasResumed() const noexcept = 0;
 
+  /// True: before the handshake nothing is written, and after it everything is encrypted.
+  bool IsSecure() const noexcept override { return true; }
+
 protected:
   ~SSLStream() override;
 };
 
-/// Settings and session memory for TLS connections: TLS 1.2 or later, cipher suites with forward secrecy alone, keys of at least
-/// 112 bits of security, peer and host name always verified. No configuration of OpenSSL changes that, and
-/// `Crypto::UseSystemConfiguration` can only narrow it. Set it up on one thread, then use it on any; not to be changed while
-/// in use. A child process made by `fork` may use the contexts of its parent; it has no session of the parent's.
+/// Settings and remembered sessions for TLS connections: TLS 1.2 or later, only cipher suites with forward secrecy,
+/// keys of at least 112 bits of security, peer and host name always verified. No configuration of OpenSSL changes that,
+/// and `Crypto::UseSystemConfiguration` can only narrow it. Set it up on one thread, then use it on any thread; do not
+/// change it while it is in use. A child process made by `fork` may use the contexts of its parent, but has none of
+/// their sessions.
 ///
 /// Each function also throws `InvalidStateException` when OpenSSL has cleaned itself up, and `OutOfMemoryException`.
 class TARVEL_API SSLContext : public Object {
@@ -55,17 +60,19 @@ public:
   virtual void TrustSystemStore() = 0;
   /// Adds the certificates of a PEM file. @throws IOException, Crypto::CryptoException
   virtual void TrustFile(const std::string &path) = 0;
-  /// Adds certificates, none of them null; each is trusted by itself, root or not. @throws Crypto::CryptoException
+  /// Adds certificates, which are not null. Each is trusted by itself, whether or not it is a root.
+  /// @throws Crypto::CryptoException
   virtual void TrustCertificates(const Crypto::CertificateList &certificates) = 0;
 
-  /// The certificate to show when the server asks for one, with its key and the certificates between it and the root.
+  /// Sets the certificate to present when the server asks for one, its key, and the certificates between it and the
+  /// root.
   /// @throws Crypto::KeyMismatchException, Crypto::CryptoException
   virtual void SetClientCertificate(const Ref<const Crypto::Certificate> &certificate,
                                     const Ref<const Crypto::PrivateKey> &key,
                                     const Crypto::CertificateList &intermediates) = 0;
 
   /// A TLS stream over `stream`, which is connected. `endpoint` ("host:port") is the key under which the session is
-  /// remembered for resumption, once the TLS stream has been closed or released.
+  /// remembered for resumption, when the TLS stream is closed or released.
   virtual Ref<SSLStream> CreateStream(const Ref<System::Stream> &stream, const std::string &endpoint) = 0;
 
 protected:

@@ -1,35 +1,14 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// The one place where tests put their own clock and their own source of UUIDs.
+/// The former place of `Environment` and `ScopedEnvironment`, kept for programs that include it.
 
 #pragma once
 
-#include <tarvel/core/export.h>
-
-#include <cstdint>
-#include <functional>
-#include <string>
+#include <tarvel/core/environment.h>
 
 namespace Tarvel::System {
 
-/// What the platform takes from outside the process's own state. An empty function means the real source.
-struct Environment {
-  std::function<std::int64_t()> utcMicroseconds; ///< microseconds since 1970-01-01T00:00:00Z
-  std::function<std::string()> uuid;             ///< a UUID's text
-};
-
-/// Puts `environment` in place of the real clock and UUID source, for the whole process, until it is destroyed. Scopes
-/// nest. The functions are called on any thread. For tests: a service must never use it.
-class TARVEL_API ScopedEnvironment {
-public:
-  explicit ScopedEnvironment(Environment environment);
-  ScopedEnvironment(const ScopedEnvironment &) = delete;
-  ScopedEnvironment &operator=(const ScopedEnvironment &) = delete;
-  ~ScopedEnvironment();
-
-private:
-  const Environment *m_environment;
-  const Environment *m_previous;
-};
+using Tarvel::Environment;
+using Tarvel::ScopedEnvironment;
 
 } // namespace Tarvel::System

@@ -59,6 +59,12 @@ public:
   /// Ends the connection at once; pending operations complete with an exception.
   virtual void Close() noexcept = 0;
 
+  /// Whether what is written is encrypted and the peer is verified before anything is sent. The same at any time, from
+  /// any thread. False unless a class says otherwise; `Ssl::SSLStream` does. A stream that only passes bytes on to
+  /// another one, for example to count them, returns that one's answer. What depends on it: `Http::UserAgent` sends
+  /// cookies with the attribute Secure only over a secure stream, and takes 443 for the default port there.
+  virtual bool IsSecure() const noexcept { return false; }
+
 protected:
   ~Stream() override;
 };

@@ -31,6 +31,7 @@ public:
   /// @throws InvalidStateException when the pool has no thread and none can be started; `work` is then never run.
   virtual Ref<ScheduledItem> QueueWorkItem(std::function<void()> work) = 0;
 
+  /// How many threads the pool may have at most.
   virtual std::size_t GetThreadCeiling() const noexcept = 0;
 
   /// How many threads the pool has now.

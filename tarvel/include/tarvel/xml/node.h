@@ -4,9 +4,9 @@
 ///
 /// The nodes of one parsed document, or one node made alone, live in one arena, which is kept alive by the `Document` and by
 /// every `Ref` to any of its nodes. Appending a node to another tree joins the two arenas for good: each `Ref` to a node of
-/// either then keeps both alive. A plain pointer to a node is good as long as any of these is. A tree may be read from any
-/// number of threads, and changed from one thread while nobody else uses it, nor copies or drops a `Ref` to it. Texts are
-/// UTF-8; a view into a tree is good as long as the tree.
+/// either then keeps both alive. A plain pointer to a node is valid while one of these keeps the arena alive. A tree may be
+/// read from any number of threads. It may be changed from one thread while no other thread uses it, or copies or releases a
+/// `Ref` to it. Texts are UTF-8; a view of a text in a tree is valid as long as the tree.
 
 #pragma once
 
@@ -27,34 +27,39 @@ class TreeBuilder;
 
 /// How characters beyond ASCII are written.
 enum class CharacterForm : std::uint8_t {
-  UTF8,      ///< as they are
-  REFERENCES ///< in text and attribute values by number (`&#xFC;`), so that a receiver reads them right whatever encoding it
-             ///< assumes; names, comments and processing instructions, where XML knows no references, as they are
+  UTF8,      ///< as UTF-8
+  REFERENCES ///< in text and attribute values as numeric references (`&#xFC;`), so that a receiver reads them correctly
+  ///< whatever encoding it assumes; as UTF-8 in names, comments and processing instructions, where XML has no
+  ///< references
 };
 
+/// The kind of a node, which says its class.
 enum class NodeKind : std::uint8_t { DOCUMENT, ELEMENT, TEXT, COMMENT, PROCESSING_INSTRUCTION };
 
-/// What every node has. Nodes are made by the factories below and by the parser, never copied.
+/// The base of all nodes. Nodes are made by the factories below and by the parser, never copied.
 class TARVEL_API Node {
 public:
   Node(const Node &) = delete;
   Node &operator=(const Node &) = delete;
 
+  /// The kind of the node.
   NodeKind GetKind() const noexcept { return m_kind; }
 
   /// The element or document that the node is a child of, or null.
   const Node *GetParent() const noexcept { return m_parent; }
   Node *GetParent() noexcept { return m_parent; }
 
+  /// The first child, or null.
   const Node *GetFirstChild() const noexcept { return m_firstChild; }
   Node *GetFirstChild() noexcept { return m_firstChild; }
+  /// The next child of the same parent, or null.
   const Node *GetNextSibling() const noexcept { return m_nextSibling; }
   Node *GetNextSibling() noexcept { return m_nextSibling; }
 
-  /// The topmost node above, or the node itself.
+  /// The topmost ancestor, or the node itself if it has no parent.
   const Node *GetRoot() const noexcept;
 
-  /// For `Ref`: they count references to the whole arena.
+  /// For `Ref`. Both count references to the whole arena.
   void AddRef() const noexcept;
   void Release() const noexcept;
 
@@ -80,9 +85,10 @@ protected:
 /// Character data; adjacent character data and CDATA sections of a source are one node.
 class TARVEL_API TextNode final : public Node {
 public:
+  /// The text.
   std::string_view GetValue() const noexcept { return m_value; }
 
-  /// @throws InvalidArgumentException when `value` is not UTF-8 or holds a character that XML 1.0 cannot carry.
+  /// @throws InvalidArgumentException when `value` is not UTF-8 or contains a character that XML 1.0 cannot carry.
   void SetValue(std::string_view value);
 
 private:
@@ -92,8 +98,10 @@ private:
   friend class TreeBuilder;
 };
 
+/// A comment.
 class TARVEL_API CommentNode final : public Node {
 public:
+  /// The text between `<!--` and `-->`.
   std::string_view GetValue() const noexcept { return m_value; }
 
 private:
@@ -103,9 +111,12 @@ private:
   friend class TreeBuilder;
 };
 
+/// A processing instruction.
 class TARVEL_API ProcessingInstructionNode final : public Node {
 public:
+  /// The target: the name after `<?`.
   std::string_view GetTarget() const noexcept { return m_target; }
+  /// The text after the target; may be empty.
   std::string_view GetData() const noexcept { return m_data; }
 
 private:
@@ -124,10 +135,13 @@ public:
 
   /// The name as written, prefix included.
   std::string_view GetName() const noexcept { return m_name; }
+  /// The prefix; empty without one.
   std::string_view GetPrefix() const noexcept {
     return m_prefixLength ? m_name.substr(0, m_prefixLength) : std::string_view();
   }
+  /// The name without the prefix.
   std::string_view GetLocalName() const noexcept { return m_prefixLength ? m_name.substr(m_prefixLength + 1) : m_name; }
+  /// The value, with references and white space replaced (XML 1.0, section 3.3.3).
   std::string_view GetValue() const noexcept { return m_value; }
 
   /// Whether this is "xmlns" or "xmlns:" followed by a prefix.
@@ -149,13 +163,16 @@ private:
   friend class TreeBuilder;
 };
 
+/// An element with its attributes and children.
 class TARVEL_API ElementNode final : public Node {
 public:
   /// The name as written, prefix included.
   std::string_view GetName() const noexcept { return m_name; }
+  /// The prefix; empty without one.
   std::string_view GetPrefix() const noexcept {
     return m_prefixLength ? m_name.substr(0, m_prefixLength) : std::string_view();
   }
+  /// The name without the prefix.
   std::string_view GetLocalName() const noexcept { return m_prefixLength ? m_name.substr(m_prefixLength + 1) : m_name; }
 
   /// Where the start tag begins in the source: line and column from 1, the column in bytes; both 0 for an element that
@@ -164,8 +181,8 @@ public:
   std::uint32_t GetColumn() const noexcept { return m_column; }
 
   /// The namespace bound to `prefix` (empty: the default namespace) by the declarations in scope here, looked up afresh at
-  /// each call. "xml" and "xmlns" are always bound. The default namespace counts as bound to the empty text when nobody
-  /// declares it. A declaration with an empty value unbinds its prefix.
+  /// each call. "xml" and "xmlns" are always bound. Without a declaration, the default namespace counts as bound to the
+  /// empty text. A declaration with an empty value unbinds its prefix.
   /// @return whether the prefix is bound; `uri` is written only then.
   bool LookupNamespace(std::string_view prefix, std::string_view &uri) const noexcept;
 
@@ -175,14 +192,15 @@ public:
   /// Whether the element has that local name and its prefix is bound to that namespace.
   bool HasQName(std::string_view namespaceUri, std::string_view localName) const noexcept;
 
+  /// The first attribute, namespace declarations included, or null.
   const Attribute *GetFirstAttribute() const noexcept { return m_firstAttribute; }
 
   /// The attribute of that qualified name (an empty namespace means: written without a prefix), or null. Namespace
-  /// declarations are not found by it.
+  /// declarations are not found.
   const Attribute *FindAttribute(std::string_view namespaceUri, std::string_view localName) const noexcept;
   const Attribute *FindAttribute(const QName &name) const noexcept;
 
-  /// Reads the attribute's value. @return whether the attribute is there; `value` is written only then.
+  /// Reads the attribute's value. @return whether the attribute exists; `value` is written only then.
   bool GetAttribute(const QName &name, std::string_view &value) const noexcept;
 
   /// The first child element of that qualified name, or null.
@@ -196,11 +214,10 @@ public:
   /// Adds an attribute, or a namespace declaration, of that name as written; an attribute of the same name gets the new
   /// value and keeps its place.
   /// @throws InvalidArgumentException when the name is not a name of XML Namespaces 1.0, or the value is not UTF-8 or
-  ///         holds a character that XML 1.0 cannot carry.
+  ///         contains a character that XML 1.0 cannot carry.
   void DefineAttribute(std::string_view qualifiedName, std::string_view value);
 
-  /// Makes `child` the last child. A document element may be taken out of its document by this; its document is then
-  /// without one.
+  /// Makes `child` the last child. The child of a document, such as its document element, is removed from the document.
   /// @throws InvalidArgumentException when `child` is null, a document, the element itself or above it.
   /// @throws InvalidStateException when `child` already is the child of an element.
   void AppendChild(Node *child);
@@ -210,13 +227,13 @@ public:
   /// @throws InvalidArgumentException when prefix or local name is not a name without a colon (NCName).
   ElementNode *AppendElement(std::string_view prefix, std::string_view localName);
 
-  /// Makes a new text node the last child, likewise. The memory of this element's tree is wiped when it is freed, since the
-  /// text may be secret.
-  /// @throws InvalidArgumentException when `value` is not UTF-8 or holds a character that XML 1.0 cannot carry.
+  /// Makes a new text node the last child, also in the memory of this element's tree. That memory is wiped when it is freed,
+  /// since the text may be secret.
+  /// @throws InvalidArgumentException when `value` is not UTF-8 or contains a character that XML 1.0 cannot carry.
   void AppendText(std::string_view value);
 
-  /// Writes the element and all below as UTF-8 XML, without an XML declaration. Text, attribute values and line ends are
-  /// escaped so that a parser gives back the same tree, in either form; an element without children is written as
+  /// Writes the element and all nodes below it as UTF-8 XML, without an XML declaration. In either form, text, attribute
+  /// values and line ends are escaped so that parsing yields the same tree. An element without children is written as
   /// "<name></name>".
   void WriteTo(Writer &writer, CharacterForm form = CharacterForm::UTF8) const;
 
@@ -229,7 +246,7 @@ private:
     Attribute **nextDeclaration;
   };
 
-  // Both take views that live as long as the arena.
+  // The views passed to both must live as long as the arena.
   void SetName(std::string_view name) noexcept;
   void AppendAttribute(AttributeEnd &end, std::string_view name, std::size_t prefixLength, std::string_view value);
 
@@ -264,12 +281,12 @@ inline const TextNode *AsText(const Node *node) noexcept {
   return node && node->GetKind() == NodeKind::TEXT ? static_cast<const TextNode *>(node) : nullptr;
 }
 
-/// A new element, child of nothing, without attributes and children.
+/// A new element without a parent, attributes or children.
 /// @param prefix may be empty.
 /// @throws InvalidArgumentException when prefix or local name is not a name without a colon (NCName).
 TARVEL_API void CreateElementNode(std::string_view prefix, std::string_view localName, Ref<ElementNode> &out);
 
-/// A new text node, child of nothing, with an empty value.
+/// A new text node without a parent, with an empty value.
 TARVEL_API void CreateTextNode(Ref<TextNode> &out);
 
 } // namespace Tarvel::Xml

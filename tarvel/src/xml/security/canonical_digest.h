@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// The digest of a canonical form, without the canonical form ever standing in memory.
+/// The digest of a canonical form, computed without keeping the canonical form in memory.
 
 #pragma once
 
@@ -14,10 +14,10 @@
 
 namespace Tarvel::Xml::Security {
 
-/// The first `Crypto::DigestBytes(algorithm)` bytes count.
+/// Only the first `Crypto::DigestBytes(algorithm)` bytes are used.
 using DigestValue = std::array<std::uint8_t, Crypto::MAX_DIGEST_BYTES>;
 
-/// @throws as `WriteCanonicalForm` and `Crypto::Digest`.
+/// @throws what `WriteCanonicalForm` and `Crypto::Digest` throw.
 DigestValue DigestCanonicalForm(const Node &apex, const CanonicalMethod &method, const Node *omitted,
                                 Crypto::DigestAlgorithm algorithm);
 

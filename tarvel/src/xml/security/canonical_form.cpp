@@ -23,7 +23,7 @@ namespace Tarvel::Xml::Security {
 
 namespace {
 
-// Attributes are sorted by namespace name, so a long one would be compared again and again.
+// Attributes are sorted by namespace name, so a long name would be compared many times.
 constexpr std::size_t MAX_NAMESPACE_NAME_BYTES = 4096;
 
 constexpr std::string_view INCLUSIVE_WITH_LONE_NUMBER_SIGN = "http://www.w3.org/TR/2001/REC-xml-c14n-20010315#";
@@ -78,7 +78,7 @@ struct CanonicalAttribute {
   std::string_view namespaceUri;
   std::string_view localName;
   const Attribute *attribute;
-  std::size_t height; // 0 for the element's own, else how far above it the attribute stands
+  std::size_t height; // 0 for the element's own attribute, otherwise the distance to the ancestor that has it
 
   bool operator<(const CanonicalAttribute &other) const {
     return std::is_lt(std::tie(namespaceUri, localName, height) <=>
@@ -132,10 +132,10 @@ private:
   const Node *const m_omitted;
   CanonicalOutput m_output;
   NamespaceBindings m_bindings;
-  // With room for what a token needs, which then costs no allocation.
+  // Large enough for a token, which then needs no allocation.
   boost::container::small_vector<NamespaceBindings::Mark, 16> m_openElements;
-  boost::container::small_vector<std::size_t, 8> m_declarations;       // of the element at hand, to be written
-  boost::container::small_vector<CanonicalAttribute, 16> m_attributes; // likewise
+  boost::container::small_vector<std::size_t, 8> m_declarations;       // of the current element
+  boost::container::small_vector<CanonicalAttribute, 16> m_attributes; // of the current element
   bool m_documentElementWritten = false;
 };
 
@@ -242,7 +242,7 @@ void CanonicalWalk::GatherNamespaces(const ElementNode &element) {
   }
 }
 
-// At the apex every namespace in scope is new to the output; below it only what an element declares itself can be.
+// At the apex every namespace in scope is new to the output, below it only those that the element itself declares.
 void CanonicalWalk::GatherInclusiveNamespaces(const ElementNode &element) {
   const std::size_t first = &element == &m_apex ? 0 : m_openElements.back().bindings;
   for (std::size_t index = first; index < m_bindings.Size(); ++index) {
@@ -274,7 +274,7 @@ void CanonicalWalk::GatherAttributes(const ElementNode &element) {
   }
 }
 
-// Canonical XML 1.0, section 2.4: the apex takes over the xml: attributes of its ancestors, the nearest of each name.
+// Canonical XML 1.0, section 2.4: the apex inherits the xml: attributes of its ancestors, the nearest of each name.
 void CanonicalWalk::GatherInheritedAttributes() {
   std::size_t height = 0;
   for (const ElementNode *above = AsElement(m_apex.GetParent()); above; above = AsElement(above->GetParent())) {
@@ -304,7 +304,7 @@ void CanonicalWalk::WriteAttributes(const ElementNode &element) {
   for (const CanonicalAttribute &attribute : m_attributes) {
     if (previous && attribute.HasNameOf(*previous)) {
       if (attribute.height == 0) {
-        Refuse("the attribute \"" + StringUtil::Shorten(attribute.attribute->GetName()) + "\" stands twice", element);
+        Refuse("the attribute \"" + StringUtil::Shorten(attribute.attribute->GetName()) + "\" occurs twice", element);
       }
       continue; // a nearer one overrides it
     }
@@ -334,7 +334,7 @@ void CanonicalWalk::WriteProcessingInstruction(const ProcessingInstructionNode &
   WriteOutsideDocumentElement(instruction, false);
 }
 
-// Outside the document element a line feed keeps nodes apart: after those in front of it, before those behind it.
+// Outside the document element, line feeds separate the nodes: after each node before it, and before each node after it.
 void CanonicalWalk::WriteOutsideDocumentElement(const Node &node, bool before) {
   const Node *parent = node.GetParent();
   if (parent && parent->GetKind() == NodeKind::DOCUMENT && before == m_documentElementWritten) {

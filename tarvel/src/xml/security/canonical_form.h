@@ -20,16 +20,16 @@ struct CanonicalMethod {
   std::vector<std::string> inclusivePrefixes; ///< exclusive only; sorted; the empty prefix is the default namespace
 };
 
-/// The method that an algorithm URI names; its `inclusivePrefixes` are left empty. @return whether the URI is known.
+/// Sets `method` to the algorithm of that URI, without `inclusivePrefixes`. @return whether the URI is known.
 bool FindCanonicalMethod(std::string_view algorithmUri, CanonicalMethod &method);
 
-/// Sets the prefixes of an InclusiveNamespaces PrefixList, in which "#default" stands for the default namespace.
+/// Sets the prefixes of an InclusiveNamespaces PrefixList, in which "#default" means the default namespace.
 void SetInclusivePrefixes(CanonicalMethod &method, std::vector<std::string> prefixList);
 
 /// Writes the canonical form of the subtree at `apex`, without the subtree at `omitted` (may be null). No recursion; the
 /// cost is linear in the size of the subtree and of what is written.
 /// @throws XmlSecurityException when the tree has no canonical form: an unbound prefix, a relative or undeclaring
-///         namespace name, an attribute that stands twice; or when it is beyond the limits at the top of the source file.
+///         namespace name, an attribute that occurs twice; or when it exceeds the limits in the source files.
 void WriteCanonicalForm(const Node &apex, const CanonicalMethod &method, const Node *omitted, Writer &writer);
 
 } // namespace Tarvel::Xml::Security

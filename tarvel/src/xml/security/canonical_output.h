@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// `CanonicalOutput`, which gathers canonical octets into pieces worth passing on, and escapes what must be escaped.
+/// `CanonicalOutput`, which buffers canonical octets and escapes characters.
 
 #pragma once
 
@@ -12,15 +12,15 @@
 
 namespace Tarvel::Xml::Security {
 
-/// A buffer before a `Writer`. For one thread.
+/// A buffer in front of a `Writer`. For one thread.
 class CanonicalOutput {
 public:
   explicit CanonicalOutput(Writer &writer) noexcept : m_writer(writer) {}
   CanonicalOutput(const CanonicalOutput &) = delete;
   CanonicalOutput &operator=(const CanonicalOutput &) = delete;
 
-  /// Puts the pieces, which are texts, one after the other.
-  /// @throws XmlSecurityException when the octets altogether pass the limit.
+  /// Writes the pieces, which are texts, one after another.
+  /// @throws XmlSecurityException when the total number of octets exceeds the limit.
   template <typename... Pieces>
   void Put(const Pieces &...pieces) {
     if ((std::string_view(pieces).size() + ...) > m_buffer.size() - m_used) {
@@ -36,7 +36,7 @@ public:
   /// The inside of an attribute value: ampersand, "less than", quotation mark, tab, line feed and carriage return escaped.
   void PutAttributeValue(std::string_view value);
 
-  /// Passes on what is held back; to be called at the end.
+  /// Writes the content of the buffer to the writer. Call this at the end.
   void Flush();
 
 private:

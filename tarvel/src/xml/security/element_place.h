@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// Where an element stands, as the end of a message.
+/// The position of an element, for the end of a message.
 
 #pragma once
 

@@ -15,7 +15,7 @@ namespace {
 
 constexpr std::size_t MAX_KEY_INFO_CERTIFICATES = 16; // further ones are not compared
 
-/// `text` without white space; nothing when more than `most` characters are left, so that a long text takes little memory.
+/// `text` without white space; empty if more than `most` characters remain, so that a long text takes little memory.
 std::string WithoutWhiteSpace(std::string_view text, std::size_t most) {
   std::string compact;
   for (const char character : text) {
@@ -30,7 +30,7 @@ std::string WithoutWhiteSpace(std::string_view text, std::size_t most) {
   return compact;
 }
 
-/// The certificate texts of a `ds:KeyInfo`, as far as they are looked at.
+/// The texts of the certificates in a `ds:KeyInfo`, at most `MAX_KEY_INFO_CERTIFICATES`.
 std::vector<std::string_view> CertificateTexts(const ElementNode &keyInfo) {
   std::vector<std::string_view> texts;
   for (const Node *data = keyInfo.GetFirstChild(); data; data = data->GetNextSibling()) {
@@ -55,7 +55,7 @@ std::vector<std::string_view> CertificateTexts(const ElementNode &keyInfo) {
   return texts;
 }
 
-/// The given certificates without nulls and repetitions, in their order.
+/// The certificates in their order, without nulls and duplicates.
 KeyInfoResolver::CertificateList DistinctCertificates(const KeyInfoResolver::CertificateList &certificates) {
   KeyInfoResolver::CertificateList distinct;
   distinct.reserve(certificates.size());
@@ -95,7 +95,7 @@ public:
 
 private:
   void AddMatch(std::string_view text, CertificateList &named) const {
-    const std::string base64 = WithoutWhiteSpace(text, m_longestBase64); // once, however many are trusted
+    const std::string base64 = WithoutWhiteSpace(text, m_longestBase64); // once for all trusted certificates
     for (std::size_t index = 0; index < m_base64.size(); ++index) {
       if (base64 == m_base64[index] && std::find(named.begin(), named.end(), m_trusted[index]) == named.end()) {
         named.push_back(m_trusted[index]);
@@ -104,8 +104,8 @@ private:
   }
 
   const CertificateList m_trusted;
-  // The Base64 form of each trusted certificate, which is unique, so that comparing texts compares bytes; none when there
-  // are fewer than two certificates.
+  // The Base64 form of each trusted certificate, which is unique, so that comparing texts compares bytes; empty if
+  // there are fewer than two certificates.
   std::vector<std::string> m_base64;
   std::size_t m_longestBase64 = 0;
 };

@@ -8,8 +8,8 @@ namespace Tarvel::Xml::Security {
 
 NamespaceBindings::NamespaceBindings() {
   m_buckets.fill(END_OF_BUCKET);
-  // Both count as written, so that neither is ever declared: "xml" never needs it, and an empty default namespace only
-  // where the output has declared another one.
+  // Both count as written: "xml" is never declared, and the empty default namespace only where the output has declared
+  // another one.
   Declare("", "");
   Declare("xml", XML_NAMESPACE);
   for (Binding &binding : m_bindings) {

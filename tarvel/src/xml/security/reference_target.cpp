@@ -19,7 +19,7 @@ constexpr std::string_view WSU_NAMESPACE =
   throw XmlSecurityException("The reference URI \"" + StringUtil::Shorten(uri) + "\" is not accepted: " + why);
 }
 
-/// The identifier behind the "#", which must be a bare name.
+/// The identifier after the "#", which must be a bare name.
 std::string_view RequireIdentifier(std::string_view uri) {
   if (uri.front() != '#') {
     Refuse(uri, "it points outside the document");
@@ -43,7 +43,7 @@ bool IsIdentifier(const Attribute &attribute, const ElementNode &element) {
          element.LookupNamespace(attribute.GetPrefix(), uri) && uri == WSU_NAMESPACE;
 }
 
-/// Whether the element is identified by `identifier`. The value is compared first, since it rarely fits.
+/// Whether the element is identified by `identifier`. The value is compared first, since it rarely matches.
 bool HasIdentifier(const ElementNode &element, std::string_view identifier) {
   for (const Attribute *attribute = element.GetFirstAttribute(); attribute; attribute = attribute->GetNext()) {
     if (attribute->GetValue() == identifier && IsIdentifier(*attribute, element)) {
@@ -64,7 +64,7 @@ const Node *NextInDocument(const Node *node, const Node *top) {
   return node == top ? nullptr : node->GetNextSibling();
 }
 
-/// The index of the first of the `uris` that is the one at `index`.
+/// The index of the first URI that equals the one at `index`.
 std::size_t FirstEqual(const std::vector<std::string_view> &uris, std::size_t index) {
   return static_cast<std::size_t>(std::find(uris.begin(), uris.end(), uris[index]) - uris.begin());
 }

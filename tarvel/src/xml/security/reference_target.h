@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// From the URI of a reference to the one node that it means.
+/// Resolving the URI of a reference to the one node that it refers to.
 
 #pragma once
 
@@ -12,21 +12,21 @@
 
 namespace Tarvel::Xml::Security {
 
-/// One look through a tree, for the element that has an identifier, and whose reference it is.
+/// A search in a tree for the element that has an identifier.
 struct IdentifierSearch {
   std::string_view identifier;
-  std::size_t reference; ///< index of the first of the URIs that name it
+  std::size_t reference; ///< index of the first URI with that identifier
   const Node *target = nullptr;
 };
 
-/// The searches that `uris` need: one for each identifier, however many of them repeat it, and none for "".
-/// @throws XmlSecurityException when an URI is of another kind.
+/// The searches that `uris` need: one for each different identifier, and none for "".
+/// @throws XmlSecurityException when a URI is neither "" nor "#x".
 std::vector<IdentifierSearch> PlanSearches(const std::vector<std::string_view> &uris);
 
-/// The targets of `uris`, in their order, in the tree that holds `root`: "" is the document (or topmost element), "#x" the
-/// one element with an identifier x in an attribute ID, Id, wsu:Id or xml:id. The tree is walked once, for all of them.
-/// An identifier that `root` itself has can therefore mean nothing but `root`.
-/// @throws XmlSecurityException when an URI is of another kind, or not exactly one element has the identifier.
+/// The targets of `uris`, in their order, in the tree that contains `root`: "" is the document (or topmost element), "#x"
+/// the one element with an identifier x in an attribute ID, Id, wsu:Id or xml:id. So an identifier of `root` itself cannot
+/// refer to another element. The tree is walked once for all of them.
+/// @throws XmlSecurityException when a URI is neither "" nor "#x", or not exactly one element has the identifier.
 std::vector<const Node *> ResolveReferences(const ElementNode &root, const std::vector<std::string_view> &uris);
 
 } // namespace Tarvel::Xml::Security

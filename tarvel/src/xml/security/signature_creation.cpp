@@ -17,17 +17,21 @@ namespace Tarvel::Xml::Security {
 
 namespace {
 
+[[noreturn]] void RefuseAlgorithm(const std::string &kind, std::string_view uri) {
+  throw XmlSecurityException("Signing with the " + kind + " algorithm \"" + StringUtil::Shorten(uri) +
+                             "\" is not supported");
+}
+
 void RequireExclusive(std::string_view canonicalizationUri) {
   if (canonicalizationUri != CanonicalizationUri::EXCLUSIVE) {
-    throw XmlSecurityException("The canonicalization algorithm \"" + StringUtil::Shorten(canonicalizationUri) +
-                               "\" is not signed with");
+    RefuseAlgorithm("canonicalization", canonicalizationUri);
   }
 }
 
 SignatureAlgorithm RequireSigningAlgorithm(std::string_view uri) {
   const std::optional<SignatureAlgorithm> algorithm = FindSignatureAlgorithm(uri);
   if (!algorithm || algorithm->scheme != Crypto::SignatureScheme::RSA_PKCS1) {
-    throw XmlSecurityException("The signature algorithm \"" + StringUtil::Shorten(uri) + "\" is not signed with");
+    RefuseAlgorithm("signature", uri);
   }
   return *algorithm;
 }
@@ -81,7 +85,7 @@ void BlankSignature::AddReference(std::string_view uri, std::string_view digestU
   RequireExclusive(transformUri);
   const std::optional<Crypto::DigestAlgorithm> digest = FindDigestAlgorithm(digestUri);
   if (!digest) {
-    throw XmlSecurityException("The digest algorithm \"" + StringUtil::Shorten(digestUri) + "\" is not signed with");
+    RefuseAlgorithm("digest", digestUri);
   }
   m_digestMethods.push_back({std::string(digestUri), *digest});
   m_references.push_back({std::string(uri)});

@@ -71,7 +71,7 @@ void RequireNoParameters(const AlgorithmSyntax &syntax) {
   }
 }
 
-/// The prefixes of a list that blanks keep apart. Counted while it is read: a list of millions needs no memory.
+/// The prefixes of a list separated by white space. They are counted while reading: a list of millions needs no memory.
 std::vector<std::string> RequirePrefixes(std::string_view list, std::string_view uri) {
   std::vector<std::string> prefixes;
   for (std::size_t begin = list.find_first_not_of(WHITE_SPACE); begin != std::string_view::npos;) {
@@ -118,8 +118,8 @@ DigestAlgorithm RequireDigestAlgorithm(const AlgorithmSyntax &syntax) {
   return *algorithm;
 }
 
-/// At most the enveloped-signature transform, then at most one canonicalisation: what comes after that would have to parse
-/// octets again.
+/// Accepts the enveloped-signature transform, then one canonicalisation, each at most once: a transform after that would have
+/// to parse octets again.
 void PlanTransforms(const std::vector<AlgorithmSyntax> &transforms, ReferencePlan &plan) {
   if (transforms.size() > MAX_TRANSFORMS) {
     throw XmlSecurityException("A reference has " + std::to_string(transforms.size()) + " transforms; at most " +
@@ -148,7 +148,7 @@ ReferencePlan PlanReference(const ReferenceSyntax &syntax) {
   }
   ReferencePlan plan;
   PlanTransforms(syntax.transforms, plan);
-  // XML Signature, sections 4.4.3.2 and 4.4.3.3: "" and "#x" select a node set without comments, whatever canonicalises it.
+  // XML Signature, sections 4.4.3.2 and 4.4.3.3: "" and "#x" select a node set without comments, whatever the transforms.
   plan.method.withComments = false;
   plan.digest = RequireDigestAlgorithm(syntax.digestMethod);
   return plan;

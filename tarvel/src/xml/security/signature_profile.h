@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// The algorithms and shapes of a signature that are accepted; everything else is refused by name.
+/// The algorithms and forms of signatures that are accepted; everything else is refused by name.
 
 #pragma once
 
@@ -20,7 +20,7 @@ struct SignatureAlgorithm {
   Crypto::DigestAlgorithm digest;
 };
 
-/// What a reference's digest is computed over, besides its target.
+/// How the digest of a reference is computed from its target.
 struct ReferencePlan {
   bool omitsSignature = false; ///< the enveloped-signature transform
   CanonicalMethod method;      ///< never with comments: same-document references leave them out

@@ -34,16 +34,16 @@ bool IsWhiteSpace(std::string_view text) {
   return text.find_first_not_of(WHITE_SPACE) == std::string_view::npos;
 }
 
-/// Steps through the child elements of an element that must have nothing else of substance.
+/// Steps through the child elements of an element, which may contain nothing else but white space and comments.
 class ChildElements {
 public:
   explicit ChildElements(const ElementNode &parent) : m_parent(parent) { MoveTo(parent.GetFirstChild()); }
 
-  /// The element that stands here, or null at the end.
+  /// The current element, or null at the end.
   const ElementNode *Current() const noexcept { return m_current; }
   void MoveOn() { MoveTo(m_current->GetNextSibling()); }
 
-  /// Steps over the ds element of that name, if it stands here; else answers null.
+  /// Returns the current element and steps past it if it is the ds element of that name; otherwise returns null.
   const ElementNode *TakeIf(std::string_view localName) {
     const ElementNode *element = m_current;
     if (!element || !IsSignatureElement(*element, localName)) {
@@ -57,7 +57,7 @@ public:
     if (const ElementNode *element = TakeIf(localName)) {
       return *element;
     }
-    const std::string found = m_current ? Quote(m_current->GetName()) + " stands there" : "nothing follows";
+    const std::string found = m_current ? "found " + Quote(m_current->GetName()) : "nothing follows";
     Fail("Expected ds:" + std::string(localName) + " in " + Quote(m_parent.GetName()) + ", but " + found,
          m_current ? *m_current : m_parent);
   }
@@ -83,7 +83,7 @@ private:
   const ElementNode *m_current = nullptr;
 };
 
-/// Refuses attributes but those named; namespace declarations are always allowed.
+/// Refuses attributes other than `names`; namespace declarations are always allowed.
 void RequireAttributesAmong(const ElementNode &element, std::initializer_list<std::string_view> names) {
   for (const Attribute *attribute = element.GetFirstAttribute(); attribute; attribute = attribute->GetNext()) {
     if (!attribute->IsNamespaceDeclaration() &&

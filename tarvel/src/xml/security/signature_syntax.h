@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// The form of a `ds:Signature`, read without judging its algorithms.
+/// The syntax of a `ds:Signature`, read without checking its algorithms.
 
 #pragma once
 
@@ -14,12 +14,12 @@
 
 namespace Tarvel::Xml::Security {
 
-/// An element that names an algorithm: CanonicalizationMethod, SignatureMethod, DigestMethod or Transform. Views belong to
+/// An element that specifies an algorithm: CanonicalizationMethod, SignatureMethod, DigestMethod or Transform. Views belong to
 /// the tree.
 struct AlgorithmSyntax {
   std::string_view uri;
   std::optional<std::string_view> prefixList; ///< of an ec:InclusiveNamespaces, as written
-  std::string_view otherParameter; ///< name of the first child element that is none; empty when there is none such
+  std::string_view otherParameter;            ///< name of the first other child element; empty if there is none
 };
 
 struct ReferenceSyntax {
@@ -34,13 +34,13 @@ struct SignatureSyntax {
   const ElementNode *signedInfo = nullptr;
   AlgorithmSyntax canonicalizationMethod;
   AlgorithmSyntax signatureMethod;
-  std::vector<ReferenceSyntax> references; ///< may be empty: whoever asks what is signed then learns that nothing is
+  std::vector<ReferenceSyntax> references; ///< may be empty; then nothing is signed
   std::vector<std::uint8_t> signatureValue;
-  const ElementNode *keyInfo = nullptr; ///< may be null; what it holds is not looked at
+  const ElementNode *keyInfo = nullptr; ///< may be null; its content is not checked
   bool hasObject = false;
 };
 
-/// Reads the form (XML Signature, section 4): elements of the ds namespace in their order, the attributes that they may
+/// Reads the syntax (XML Signature, section 4): elements of the ds namespace in their order, the attributes that they may
 /// have and those that they must have, Base64 text where it belongs, nothing but white space and comments between elements.
 /// @throws SignatureSyntaxException naming what is wrong and where.
 SignatureSyntax ReadSignatureSyntax(const ElementNode &signature);

@@ -68,9 +68,10 @@ private:
   bool IsGenuine(const KeyInfoResolver &resolver) const;
   Crypto::CertificateList UsableKeys(const KeyInfoResolver &resolver, Crypto::SignatureScheme scheme) const;
   std::vector<const Node *> Targets() const;
-  void RequireEnveloping(const Node &target, const ReferencePlan &plan, const ReferenceSyntax &reference) const;
-  bool DigestFits(const Node &target, const ReferencePlan &plan, const ReferenceSyntax &reference) const;
-  bool SignatureValueFits(const SignaturePlan &plan, const Crypto::CertificateList &keys) const;
+  void RequireTargetContainsSignature(const Node &target, const ReferencePlan &plan,
+                                      const ReferenceSyntax &reference) const;
+  bool DigestMatches(const Node &target, const ReferencePlan &plan, const ReferenceSyntax &reference) const;
+  bool SignatureMatches(const SignaturePlan &plan, const Crypto::CertificateList &keys) const;
 
   const Ref<const ElementNode> m_root;
   const Ref<const ElementNode> m_element;
@@ -97,14 +98,15 @@ bool ParsedSignature::IsGenuine(const KeyInfoResolver &resolver) const {
   const Crypto::CertificateList keys = UsableKeys(resolver, plan.algorithm.scheme);
   const std::vector<const Node *> targets = Targets();
   for (std::size_t index = 0; index < targets.size(); ++index) {
-    RequireEnveloping(*targets[index], plan.references[index], m_syntax.references[index]);
+    RequireTargetContainsSignature(*targets[index], plan.references[index], m_syntax.references[index]);
   }
-  // Digesting may cost as much as ten times the document's size: only a signer may ask for that.
-  if (!SignatureValueFits(plan, keys)) {
+  // The digests may cost as much as hashing the document ten times. Since the signature comes first, only a signer can
+  // cause that work.
+  if (!SignatureMatches(plan, keys)) {
     return false;
   }
   for (std::size_t index = 0; index < targets.size(); ++index) {
-    if (!DigestFits(*targets[index], plan.references[index], m_syntax.references[index])) {
+    if (!DigestMatches(*targets[index], plan.references[index], m_syntax.references[index])) {
       return false;
     }
   }
@@ -133,29 +135,29 @@ std::vector<const Node *> ParsedSignature::Targets() const {
   return ResolveReferences(*m_root, uris);
 }
 
-void ParsedSignature::RequireEnveloping(const Node &target, const ReferencePlan &plan,
-                                        const ReferenceSyntax &reference) const {
+void ParsedSignature::RequireTargetContainsSignature(const Node &target, const ReferencePlan &plan,
+                                                     const ReferenceSyntax &reference) const {
   const Node *const signature = m_element.get();
   if (plan.omitsSignature && (signature == &target || !IsWithin(signature, target))) {
     throw XmlSecurityException("The reference URI \"" + StringUtil::Shorten(reference.uri) +
                                "\" has the enveloped-signature transform, but does not envelop the signature");
   }
-  // Without its document element a document has nothing that could be signed, and the digest of nothing fits every such.
+  // Without its document element, a document has no content to sign, and the digest of nothing matches any such document.
   if (plan.omitsSignature && target.GetKind() == NodeKind::DOCUMENT && signature->GetParent() == &target) {
     throw XmlSecurityException("The reference URI \"" + StringUtil::Shorten(reference.uri) +
                                "\" covers nothing but the signature, which the enveloped-signature transform removes");
   }
 }
 
-bool ParsedSignature::DigestFits(const Node &target, const ReferencePlan &plan,
-                                 const ReferenceSyntax &reference) const {
+bool ParsedSignature::DigestMatches(const Node &target, const ReferencePlan &plan,
+                                    const ReferenceSyntax &reference) const {
   const Node *const omitted = plan.omitsSignature ? m_element.get() : nullptr;
   const DigestValue digest = DigestCanonicalForm(target, plan.method, omitted, plan.digest);
   return reference.digestValue.size() == Crypto::DigestBytes(plan.digest) &&
          CRYPTO_memcmp(reference.digestValue.data(), digest.data(), reference.digestValue.size()) == 0;
 }
 
-bool ParsedSignature::SignatureValueFits(const SignaturePlan &plan, const Crypto::CertificateList &keys) const {
+bool ParsedSignature::SignatureMatches(const SignaturePlan &plan, const Crypto::CertificateList &keys) const {
   const DigestValue digest =
       DigestCanonicalForm(*m_syntax.signedInfo, plan.signedInfoMethod, nullptr, plan.algorithm.digest);
   for (const Ref<const Crypto::Certificate> &key : keys) {

@@ -26,10 +26,10 @@ constexpr std::string_view EXCLUSIVE_WITH_COMMENTS = "http://www.w3.org/2001/10/
 /// Writes nodes in the canonical form of one algorithm. Immutable; safe on any thread.
 class TARVEL_API Canonicalizer : public Object {
 public:
-  /// Writes the canonical form of the subtree at `node` (a document node: of the whole document) as it stands in its
-  /// document, octet for octet, piece by piece.
+  /// Writes the canonical form of the subtree at `node`, in the context of its document; for a document node, of the whole
+  /// document. `writer` receives it in pieces.
   /// @throws XmlSecurityException when the tree has no canonical form: an unbound prefix, or a relative namespace name.
-  ///         What was written before is then of no use.
+  ///         What was written before must then be discarded.
   virtual void Canonicalize(const Node &node, Writer &writer) const = 0;
 
 protected:
@@ -40,7 +40,7 @@ protected:
 /// means the same algorithm.
 /// @param inclusivePrefixes for the exclusive algorithms, the InclusiveNamespaces PrefixList ("#default" is the default
 ///        namespace); must be empty for the inclusive ones.
-/// @throws XmlSecurityException naming the URI, for any other algorithm.
+/// @throws XmlSecurityException for any other algorithm; the message contains the URI.
 TARVEL_API Ref<Canonicalizer> CreateCanonicalizer(std::string_view algorithmUri,
                                                   const std::vector<std::string> &inclusivePrefixes = {});
 

@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// Where the keys come from that signatures are verified with.
+/// The source of the keys that signatures are verified with.
 
 #pragma once
 
@@ -13,9 +13,10 @@
 
 namespace Tarvel::Xml::Security {
 
-/// Names the certificates whose keys a signature may have been made with. Immutable; safe on any thread.
+/// Supplies the certificates whose keys a signature may have been made with. Immutable; safe on any thread.
 class TARVEL_API KeyInfoResolver : public Object {
 public:
+  /// The candidates, in order.
   using CertificateList = std::vector<Ref<const Crypto::Certificate>>;
 
   /// The candidates for a signature, in the order in which to try them.
@@ -27,9 +28,9 @@ protected:
 };
 
 /// A resolver over a fixed set of trusted certificates. Trust is in the key: validity dates, names and extensions of a
-/// trusted certificate are not judged. A `KeyInfo` whose X509Data holds one of the certificates, byte for byte, selects that
-/// one, and one that holds several selects these; every other `KeyInfo`, and none, leaves the whole set. Its first 16
-/// certificates are compared. Null references in `trusted` are passed over, equal certificates count once.
+/// trusted certificate are not checked. A `KeyInfo` whose X509Data contains trusted certificates, byte for byte, selects these;
+/// any other `KeyInfo`, or none, selects the whole set. Only the first 16 certificates of a `KeyInfo` are compared. Null
+/// references in `trusted` are ignored, and equal certificates count once.
 TARVEL_API Ref<KeyInfoResolver> CreateTrustSetKeyResolver(const KeyInfoResolver::CertificateList &trusted);
 
 } // namespace Tarvel::Xml::Security

@@ -18,7 +18,7 @@
 
 namespace Tarvel::Xml::Security {
 
-/// Algorithm URIs of signatures, digests and transforms that the profile knows besides canonicalisation.
+/// Algorithm URIs that the profile accepts for signatures, digests and transforms, apart from canonicalisation.
 namespace SignatureUri {
 constexpr std::string_view RSA_SHA256 = "http://www.w3.org/2001/04/xmldsig-more#rsa-sha256";
 constexpr std::string_view RSA_SHA384 = "http://www.w3.org/2001/04/xmldsig-more#rsa-sha384";
@@ -36,11 +36,11 @@ constexpr std::string_view ENVELOPED_SIGNATURE = "http://www.w3.org/2000/09/xmld
 constexpr std::string_view NAMESPACE = "http://www.w3.org/2000/09/xmldsig#";
 } // namespace SignatureUri
 
-/// One `ds:Signature`: taken from a tree to be verified, or blank, to be filled and signed. Verification may run on
-/// several threads at once; filling and signing is for one.
+/// One `ds:Signature`: read from a tree, for verification, or blank, for signing. Verification may run on several threads at
+/// once; `AddReference`, `SetKeyInfo` and `Sign` are for one thread.
 class TARVEL_API Signature : public Object {
 public:
-  /// One `ds:Reference`, as its URI says it.
+  /// One `ds:Reference`.
   struct Reference {
     std::string uri; ///< "" is the document, "#x" the element whose identifier is x
   };
@@ -48,13 +48,13 @@ public:
   /// The references in document order.
   virtual const std::vector<Reference> &GetReferences() const noexcept = 0;
 
-  /// Checks the signature over `SignedInfo` with each candidate key until one fits, and then the digest of every
-  /// reference: only a signer may ask for that work.
-  /// @param signedUris receives the URIs of the references when the answer is true, and is left alone otherwise.
+  /// Checks the signature over `SignedInfo` with each candidate key until one matches, and then the digest of every
+  /// reference. In this order, only a signer can cause the work of computing the digests.
+  /// @param signedUris the URIs of the references are added to it if the result is true; otherwise it is unchanged.
   /// @return false when a digest or the signature value is wrong.
   /// @throws OutOfMemoryException, and InvalidStateException when OpenSSL has cleaned itself up: neither is a verdict.
   /// @throws XmlSecurityException for an algorithm outside the profile, a reference that does not resolve to exactly one
-  ///         node, a tree without canonical form, or when no candidate key can be used with the signature's algorithm.
+  ///         node, a tree without a canonical form, or when no candidate key can be used with the signature's algorithm.
   virtual bool Verify(const KeyInfoResolver &resolver, std::set<std::string> &signedUris) const = 0;
 
   /// Adds a reference to be signed, with one transform.
@@ -62,12 +62,12 @@ public:
   ///         than SHA-256/384/512. @throws InvalidStateException after `Sign`, and for a signature taken from a tree.
   virtual void AddReference(std::string_view uri, std::string_view digestUri, std::string_view transformUri) = 0;
 
-  /// Makes `content` the only child of the signature's `ds:KeyInfo`; it is put there by `Sign`.
+  /// Makes `content` the only child of the signature's `ds:KeyInfo`, when `Sign` is called.
   /// @throws InvalidStateException after `Sign`, and for a signature taken from a tree.
   virtual void SetKeyInfo(const Ref<ElementNode> &content) = 0;
 
-  /// Computes the digests over the tree as it is now, and the signature value. The signature element must then be put
-  /// into the tree; the place must not change the namespaces that its `SignedInfo` sees under exclusive canonicalisation.
+  /// Computes the digests of the tree in its present state, and the signature value. The caller then inserts the signature
+  /// element into the tree, where it must not change the exclusive canonical form of `SignedInfo`.
   /// @throws OutOfMemoryException, and InvalidStateException when OpenSSL has cleaned itself up.
   /// @throws XmlSecurityException when there is no reference, one does not resolve, or the key cannot sign with the
   ///         algorithm; the signature then stays blank. @throws InvalidStateException after `Sign`, for a key info content
@@ -83,21 +83,21 @@ protected:
 };
 
 /// Reads the signature element `signature` for verification. References resolve in the document (or topmost element) that
-/// holds `root`; the enveloped-signature transform takes out this very signature element and no other.
-/// Both elements' tree is kept alive by the signature and must not be changed while it is used.
+/// contains `root`; the enveloped-signature transform removes this signature element and no other.
+/// The signature keeps the tree of both elements alive. The tree must not be changed while the signature is used.
 ///
-/// This judges syntax alone, so that `GetReferences` can tell what a signature claims to cover before anything is computed.
-/// Syntax is: elements of the ds namespace in the order of XML Signature, no attribute but those it gives them, an
-/// `Algorithm` wherever one belongs, a `URI` on each reference (one left out could be taken for ""), digest and signature
-/// values that are Base64 text and nothing else, white space and comments alone between elements. What is outside the
-/// profile though well-formed is refused by `Verify`: an unknown algorithm or parameter, `ds:Object`, a reference's `Type`,
-/// no reference at all or more than ten, more than two transforms or a second one after a canonicalisation, an URI that is
-/// neither "" nor a bare name.
-/// @throws SignatureSyntaxException naming what is wrong and where.
+/// This checks only the syntax, so that `GetReferences` can report what a signature claims to cover before anything is
+/// computed. The syntax is: elements of the ds namespace in the order of XML Signature, only the attributes that it defines,
+/// an `Algorithm` wherever one belongs, a `URI` on each reference (a missing one could be taken for ""), digest and
+/// signature values that are Base64 text and nothing else, only white space and comments between elements. `Verify` refuses
+/// what has this syntax but is outside the profile: an unknown algorithm or parameter, `ds:Object`, a reference's `Type`, no
+/// reference at all or more than ten, more than two transforms or a second one after a canonicalisation, a URI that is
+/// neither "" nor "#" and a bare name.
+/// @throws SignatureSyntaxException whose message says what is wrong and where.
 TARVEL_API void CreateSignatureFromDom(const ElementNode &root, const ElementNode &signature, Ref<Signature> &out);
 
-/// A blank signature to be filled and signed; its references resolve in the tree of `root`. Its elements have the prefix
-/// `prefix`, which the signature element declares itself.
+/// A blank signature, for signing. Its references resolve in the tree of `root`. Its elements have the prefix `prefix`, which
+/// the signature element declares.
 /// @throws XmlSecurityException for algorithms other than exclusive canonicalisation and RSA-SHA256/384/512.
 TARVEL_API void CreateBlankSignature(const Ref<ElementNode> &root, std::string_view canonicalizationUri,
                                      std::string_view signatureUri, std::string_view prefix, Ref<Signature> &out);

@@ -1,0 +1,75 @@
+// SPDX-License-Identifier: Apache-2.0
+/// @file
+/// Makes `fork` safe in a process that runs our threads: `fork` waits until no thread holds a lock.
+///
+/// A child has only the thread that forked. A lock that another thread held at that moment, ours or one inside OpenSSL,
+/// stays locked there for ever. So each thread declares when it computes, `fork` waits until none does, and a thread that
+/// is about to begin waits for `fork`. A thread that waits for the network or runs the host's code does not count as computing.
+
+#pragma once
+
+#include <mutex>
+
+namespace Tarvel {
+
+/// While one exists, `fork` on another thread waits. One thread may have several at once. Do not hold one while you wait
+/// for the network, for another thread or for the host's code.
+class Computation {
+public:
+  Computation() noexcept;
+  Computation(const Computation &) = delete;
+  Computation &operator=(const Computation &) = delete;
+  ~Computation();
+};
+
+/// Surrounds a call of the host's function. While it exists, the calling thread does not count as computing, whatever it
+/// has begun, so that the host may fork there, or wait for a thread that forks. Our own locks must not be held.
+class HostCall {
+public:
+  HostCall() noexcept;
+  HostCall(const HostCall &) = delete;
+  HostCall &operator=(const HostCall &) = delete;
+  ~HostCall();
+
+private:
+  const unsigned m_suspended; // how many computations the thread had begun
+};
+
+/// A mutex whose holder counts as computing, so that no child finds it locked. `std::condition_variable_any` releases it
+/// while it waits.
+class ForkSafeMutex {
+public:
+  void lock();
+  void unlock() noexcept;
+
+private:
+  std::mutex m_mutex;
+};
+
+/// The number of forks between the process that first used the platform and this one. An object that was made under another
+/// number belongs to a parent: its threads do not exist here, and what it shares with the parent must not be touched.
+unsigned GetForkGeneration() noexcept;
+
+/// Acts when the process forks.
+class ForkListener {
+public:
+  /// Makes the threads of this object stop computing soon. Called on the forking thread, while others still compute.
+  virtual void BeforeFork() noexcept = 0;
+  /// Called when no other thread computes.
+  virtual void AtFork() noexcept = 0;
+  virtual void AfterForkInParent() noexcept = 0;
+  /// Called in the child, where there is no other thread.
+  virtual void AfterForkInChild() noexcept = 0;
+
+protected:
+  ~ForkListener() = default;
+};
+
+/// Makes `listener`, which must live as long as the process, act at each later fork. It replaces an earlier listener. Called
+/// by a thread that computes.
+void SetForkListener(ForkListener *listener) noexcept;
+
+/// Whether a thread waits in `fork` for the computations to end. For tests.
+bool IsForkUnderWay() noexcept;
+
+} // namespace Tarvel

@@ -1,0 +1,36 @@
+// SPDX-License-Identifier: Apache-2.0
+/// @file
+/// What a C++ block without an #include of its own may use: these headers and, outside of functions, these parameters.
+
+#pragma once
+
+#include <ssoclient/ssoclient.h>
+#include <tarvel/core/checked_cast.h>
+#include <tarvel/core/secret_text.h>
+#include <tarvel/core/string_util.h>
+#include <tarvel/crypto/certificate.h>
+#include <tarvel/crypto/private_key.h>
+#include <tarvel/crypto/system_configuration.h>
+#include <tarvel/io/reader.h>
+#include <tarvel/service/app.h>
+#include <tarvel/ssl/ssl_context.h>
+#include <tarvel/xml/document.h>
+#include <tarvel/xml/parser.h>
+
+#include <algorithm>
+#include <chrono>
+#include <cstdint>
+#include <future>
+#include <iostream>
+#include <memory>
+#include <set>
+#include <string>
+#include <utility>
+#include <vector>
+
+#define PARAMETERS                                                                                                     \
+  [[maybe_unused]] const std::shared_ptr<const SsoClient::SecurityTokenService> &service,                              \
+      [[maybe_unused]] SsoClient::SecurityTokenServiceConfig &config, [[maybe_unused]] SsoClient::TokenSpec &spec,     \
+      [[maybe_unused]] std::shared_ptr<const SsoClient::SamlToken> &token,                                             \
+      [[maybe_unused]] const Tarvel::Crypto::CertificateList &trusted, [[maybe_unused]] const std::string &xml,        \
+      [[maybe_unused]] const std::string &password, [[maybe_unused]] const Tarvel::SecretText &secret

@@ -1,0 +1,12 @@
+// SPDX-License-Identifier: Apache-2.0
+/// @file
+/// Prints the version of the headers, that of the library, and that of the CMake package, a line each.
+
+#include <ssoclient/version.h>
+
+#include <cstdio>
+
+int main() {
+  std::printf("%s\n%s\n%s\n", SSOCLIENT_VERSION_STRING, SsoClient::GetLibraryVersion(), PACKAGE_VERSION);
+  return SsoClient::GetLibraryVersionNumber() == SSOCLIENT_VERSION_NUMBER ? 0 : 1;
+}

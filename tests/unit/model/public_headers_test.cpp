@@ -1,0 +1,39 @@
+// SPDX-License-Identifier: Apache-2.0
+
+#include "support/data_file.h"
+
+#include <ssoclient/ssoclient.h>
+
+#include <gtest/gtest.h>
+
+#include <filesystem>
+#include <set>
+#include <sstream>
+#include <string>
+
+namespace {
+
+TEST(UmbrellaHeader, IncludesAllOtherPublicHeadersOfTheClient) {
+  const std::string folder = "../../include/ssoclient";
+  std::set<std::string> expected;
+  for (const auto &entry : std::filesystem::directory_iterator(Testing::DataPath(folder))) {
+    if (entry.path().extension() == ".h" && entry.path().filename() != "ssoclient.h") {
+      expected.insert("#include <ssoclient/" + entry.path().filename().string() + ">");
+    }
+  }
+  EXPECT_GT(expected.size(), 10u);
+
+  std::set<std::string> included;
+  std::istringstream lines(Testing::ReadDataFile(folder + "/ssoclient.h"));
+  for (std::string line; std::getline(lines, line);) {
+    if (line.rfind("#include", 0) == 0) {
+      included.insert(line);
+    }
+  }
+  EXPECT_EQ(included, expected);
+}
+
+// One name of each kind: the header is enough for a program.
+static_assert(sizeof(SsoClient::SecurityTokenServiceConfig) > 0 && sizeof(SsoClient::PrincipalIdLess) > 0);
+
+} // namespace
