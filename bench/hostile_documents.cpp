@@ -1,4 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
+// Long because it is a table: each call of AddDocument or AddToken is one shape.
 
 #include "hostile_documents.h"
 
@@ -139,6 +140,7 @@ void AddNames(ShapeList &shapes) {
                      [](std::size_t i) { return '<' + Name(i) + std::string(LONG, 'p') + ":a/>"; });
 }
 
+// Long because each shape is an entry of its own.
 void AddNamespaces(ShapeList &shapes) {
   const std::string longUri = "urn:" + std::string(LONG, 'u');
   const std::string manyDeclarations = Repeat(MANY, Declaring(Name, Name));
@@ -257,6 +259,7 @@ std::string Before(std::string_view place) {
 }
 
 /// The signature over the digests is genuine here, so every token of the right form is digested.
+/// Long because each shape is an entry of its own.
 void AddSignedContent(ShapeList &shapes) {
   const std::string value(VALUE);
   shapes.AddToken("in a name: characters", NAME_ID, "a", Always("x"), "@corp.example");
@@ -316,6 +319,7 @@ void AddSignedContent(ShapeList &shapes) {
 }
 
 /// Documents with as many nodes as the limit allows, which take the most memory.
+/// Long because each shape is an entry of its own.
 void AddMostNodes(ShapeList &shapes) {
   shapes.AddDocument("most elements", Thin("<a~/>", 1));
   shapes.AddDocument("most elements with an end tag", Thin("<a~></a>", 1));
@@ -361,6 +365,7 @@ void AddMostNodes(ShapeList &shapes) {
 }
 
 /// `ds:KeyInfo` may contain anything, and no digest covers it.
+/// Long because each shape is an entry of its own.
 void AddSignatureContent(ShapeList &shapes) {
   const std::string after(IN_KEY_INFO);
   shapes.AddToken(

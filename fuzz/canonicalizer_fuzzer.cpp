@@ -4,6 +4,7 @@
 /// one that follows from expat's events. The first byte of the input chooses algorithm, prefix list and part; the rest
 /// is the document.
 
+#include "document_order.h"
 #include "integration/signature_oracle/expat_oracle.h"
 
 #include <tarvel/io/reader.h>
@@ -54,21 +55,10 @@ void Require(bool condition) {
   }
 }
 
-/// The next node in document order; both kinds of tree have the same shape.
-const Node *Next(const Node *node) {
-  if (node->GetFirstChild()) {
-    return node->GetFirstChild();
-  }
-  while (node && !node->GetNextSibling()) {
-    node = node->GetParent();
-  }
-  return node ? node->GetNextSibling() : nullptr;
-}
-
 /// libxml2 writes namespace names without the escapes that the recommendation requires: such documents cannot be
 /// compared.
 bool HasNamespaceNameToEscape(const Document &document) {
-  for (const Node *node = document.GetDocumentNode(); node; node = Next(node)) {
+  for (const Node *node = document.GetDocumentNode(); node; node = Fuzz::NextInDocumentOrder(node)) {
     const ElementNode *element = Tarvel::Xml::AsElement(node);
     for (const auto *attribute = element ? element->GetFirstAttribute() : nullptr; attribute;
          attribute = attribute->GetNext()) {
@@ -84,7 +74,7 @@ bool HasNamespaceNameToEscape(const Document &document) {
 /// The element number `part` of the document; the document when `part` is 0 or above the number of elements.
 const Node &PartOf(const Document &document, std::size_t part) {
   std::size_t elements = 0;
-  for (const Node *node = document.GetDocumentNode(); node; node = Next(node)) {
+  for (const Node *node = document.GetDocumentNode(); node; node = Fuzz::NextInDocumentOrder(node)) {
     if (Tarvel::Xml::AsElement(node) && ++elements == part) {
       return *node;
     }
@@ -114,6 +104,7 @@ std::optional<std::string> FormByExpat(const Document &document, std::string_vie
                                        {choice.isExclusive, choice.withComments, PrefixListOf(choice)});
 }
 
+/// The node after `node` in document order. The tree of libxml2 has the same shape as ours.
 const xmlNode *Next(const xmlNode *node) {
   if (node->children) {
     return node->children;

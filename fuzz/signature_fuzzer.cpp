@@ -3,6 +3,7 @@
 /// Signatures: reading and verifying the first `Signature` element of any document ends in an answer or in a documented
 /// exception, the same each time; and the content that a genuine signature covers is content that a trusted key signed.
 
+#include "document_order.h"
 #include "support/data_file.h"
 #include "xml/security/canonical_form.h"
 
@@ -35,18 +36,8 @@ void Require(bool condition) {
   }
 }
 
-const Node *Next(const Node *node) {
-  if (node->GetFirstChild()) {
-    return node->GetFirstChild();
-  }
-  while (node && !node->GetNextSibling()) {
-    node = node->GetParent();
-  }
-  return node ? node->GetNextSibling() : nullptr;
-}
-
 const ElementNode *FindSignature(const Document &document) {
-  for (const Node *node = document.GetDocumentNode(); node; node = Next(node)) {
+  for (const Node *node = document.GetDocumentNode(); node; node = Fuzz::NextInDocumentOrder(node)) {
     const ElementNode *element = Tarvel::Xml::AsElement(node);
     if (element && element->GetLocalName() == "Signature") {
       return element;
@@ -82,7 +73,7 @@ const Node *FindTarget(const Document &document, std::string_view uri) {
     return document.GetDocumentNode();
   }
   const Node *target = nullptr;
-  for (const Node *node = document.GetDocumentNode(); node; node = Next(node)) {
+  for (const Node *node = document.GetDocumentNode(); node; node = Fuzz::NextInDocumentOrder(node)) {
     const ElementNode *element = Tarvel::Xml::AsElement(node);
     if (element && HasIdentifier(*element, uri.substr(1))) {
       Require(!target);

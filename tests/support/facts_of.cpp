@@ -17,6 +17,21 @@ void AppendPrincipal(std::ostream &out, const char *label, const PrincipalId &pr
   out << label << " {" << principal.name << "} {" << principal.domain << "}\n";
 }
 
+void AppendAdvice(std::ostream &out, const SamlToken &token) {
+  std::vector<Advice> advice;
+  token.GetAdvice(advice);
+  for (const Advice &one : advice) {
+    out << "advice {" << one.source << "}\n";
+    for (const AdviceAttribute &attribute : one.attributes) {
+      out << "attribute {" << attribute.name << "}";
+      for (const std::string &value : attribute.values) {
+        out << " {" << value << "}";
+      }
+      out << '\n';
+    }
+  }
+}
+
 } // namespace
 
 std::string FactsOf(const SamlToken &token) {
@@ -45,18 +60,7 @@ std::string FactsOf(const SamlToken &token) {
   for (const std::string &text : audience) {
     out << "audience {" << text << "}\n";
   }
-  std::vector<Advice> advice;
-  token.GetAdvice(advice);
-  for (const Advice &one : advice) {
-    out << "advice {" << one.source << "}\n";
-    for (const AdviceAttribute &attribute : one.attributes) {
-      out << "attribute {" << attribute.name << "}";
-      for (const std::string &value : attribute.values) {
-        out << " {" << value << "}";
-      }
-      out << '\n';
-    }
-  }
+  AppendAdvice(out, token);
   if (token.GetConfirmationCertificate()) {
     out << "certificate " << token.GetConfirmationCertificate()->GetSha256Thumbprint() << '\n';
   }

@@ -3,6 +3,7 @@
 #include "support/scripted_server.h"
 
 #include "support/data_file.h"
+#include "support/loopback_socket.h"
 
 #include <openssl/err.h>
 #include <openssl/ssl.h>
@@ -12,7 +13,6 @@
 #include <cctype>
 #include <chrono>
 #include <csignal>
-#include <cstring>
 #include <netinet/in.h>
 #include <netinet/tcp.h>
 #include <poll.h>
@@ -66,38 +66,6 @@ SSL_CTX *CreateTls(const TlsSettings &settings) {
     SSL_CTX_set_verify(tls, SSL_VERIFY_PEER | SSL_VERIFY_FAIL_IF_NO_PEER_CERT, nullptr);
   }
   return tls;
-}
-
-sockaddr_storage LoopbackAddress(bool v6, socklen_t &length) {
-  sockaddr_storage storage{};
-  if (v6) {
-    sockaddr_in6 address{};
-    address.sin6_family = AF_INET6;
-    address.sin6_addr = in6addr_loopback;
-    length = sizeof address;
-    std::memcpy(&storage, &address, length);
-  } else {
-    sockaddr_in address{};
-    address.sin_family = AF_INET;
-    address.sin_addr.s_addr = htonl(INADDR_LOOPBACK);
-    length = sizeof address;
-    std::memcpy(&storage, &address, length);
-  }
-  return storage;
-}
-
-/// A socket bound to a free port of loopback, and that port.
-int BindLoopback(bool v6, int &port) {
-  const int descriptor = ::socket(v6 ? AF_INET6 : AF_INET, SOCK_STREAM | SOCK_CLOEXEC, 0);
-  Require(descriptor >= 0, "no socket");
-  socklen_t length = 0;
-  sockaddr_storage address = LoopbackAddress(v6, length);
-  Require(::bind(descriptor, reinterpret_cast<const sockaddr *>(&address), length) == 0, "cannot bind");
-  Require(::getsockname(descriptor, reinterpret_cast<sockaddr *>(&address), &length) == 0, "no address");
-  sockaddr_in bound{}; // the port is at the same place in both families
-  std::memcpy(&bound, &address, sizeof bound);
-  port = ntohs(bound.sin_port);
-  return descriptor;
 }
 
 /// OpenSSL writes to sockets without MSG_NOSIGNAL, so a write to a closed connection would raise SIGPIPE.
@@ -384,56 +352,6 @@ std::size_t ScriptedServer::GetOpenCount() const {
   const std::lock_guard<std::mutex> lock(m_mutex);
   return static_cast<std::size_t>(
       std::count_if(m_running.begin(), m_running.end(), [](const Running &running) { return !running.ended; }));
-}
-
-UnusedPort::UnusedPort() : m_descriptor(BindLoopback(false, m_port)) {}
-
-UnusedPort::~UnusedPort() {
-  ::close(m_descriptor);
-}
-
-FullPort::FullPort() : m_listener(BindLoopback(false, m_port)) {
-  Require(::listen(m_listener, 0) == 0, "cannot listen");
-  sockaddr_storage address{};
-  socklen_t length = sizeof address;
-  Require(::getsockname(m_listener, reinterpret_cast<sockaddr *>(&address), &length) == 0, "no address");
-  constexpr int FILLERS = 8;
-  for (int i = 0; i < FILLERS; ++i) {
-    const int filler = ::socket(AF_INET, SOCK_STREAM | SOCK_CLOEXEC | SOCK_NONBLOCK, 0);
-    ::connect(filler, reinterpret_cast<const sockaddr *>(&address), length);
-    m_fillers.push_back(filler);
-  }
-}
-
-FullPort::~FullPort() {
-  Empty();
-  ::close(m_listener);
-}
-
-void FullPort::Empty() {
-  for (const int filler : m_fillers) {
-    ::close(filler);
-  }
-  m_fillers.clear();
-  pollfd listener{m_listener, POLLIN, 0};
-  int waiting = 0;
-  while (::poll(&listener, 1, 0) > 0 && (waiting = ::accept4(m_listener, nullptr, nullptr, SOCK_CLOEXEC)) >= 0) {
-    ::close(waiting);
-  }
-}
-
-void FullPort::AnswerAll(std::string_view bytes) {
-  int descriptor = -1;
-  while ((descriptor = ::accept4(m_listener, nullptr, nullptr, SOCK_CLOEXEC)) >= 0) {
-    ServerConnection connection(descriptor, nullptr);
-    if (!connection.ReadRequest().empty()) {
-      connection.Write(bytes);
-    }
-  }
-}
-
-void FullPort::StopAnswering() {
-  ::shutdown(m_listener, SHUT_RDWR);
 }
 
 } // namespace Testing

@@ -1,9 +1,9 @@
 // SPDX-License-Identifier: Apache-2.0
-// Neither a password nor a response may remain in the heap. This program replaces the allocation functions of C++, and
-// searches each piece of memory when it is freed.
+// Neither a password nor a response may remain in the heap: each piece of memory is searched when it is freed.
 #include "compose/ws_security.h"
 #include "exchange/request_builder_impl.h"
 #include "exchange/soap_response.h"
+#include "integration/password_wiping/freed_memory.h"
 #include "integration/transport/service_stand_in.h"
 #include "support/identity.h"
 #include "support/rendezvous.h"
@@ -17,94 +17,18 @@
 
 #include <gtest/gtest.h>
 
-#include <malloc.h>
-
 #include <algorithm>
-#include <atomic>
 #include <cstddef>
-#include <cstdlib>
 #include <cstring>
 #include <memory>
-#include <new>
 #include <optional>
 #include <sstream>
 #include <string>
 #include <string_view>
 #include <vector>
 
-namespace {
-
-std::atomic<const char *> g_secret{nullptr}; // not owned; null when there is no search
-std::atomic<int> g_found{0};
-
-std::atomic<const void *> g_sentBody{nullptr}; // not owned; only compared, because it may be freed
-std::atomic<bool> g_isSentBodyFreed{false};
-
-void LookForSecret(const void *memory) noexcept {
-  const char *const secret = g_secret.load();
-  if (!secret || !memory) {
-    return;
-  }
-  const std::size_t bytes = malloc_usable_size(const_cast<void *>(memory));
-  if (memmem(memory, bytes, secret, std::strlen(secret))) {
-    ++g_found;
-  }
-}
-
-void *Allocate(std::size_t bytes) {
-  // Overwrites the previous content, so that only what the code under test wrote is found.
-  void *const memory = std::calloc(1, bytes ? bytes : 1);
-  if (!memory) {
-    throw std::bad_alloc();
-  }
-  return memory;
-}
-
-void Free(void *memory) noexcept {
-  LookForSecret(memory);
-  if (memory && memory == g_sentBody.load()) {
-    g_isSentBodyFreed = true;
-  }
-  std::free(memory);
-}
-
-} // namespace
-
-void *operator new(std::size_t bytes) {
-  return Allocate(bytes);
-}
-void *operator new[](std::size_t bytes) {
-  return Allocate(bytes);
-}
-void operator delete(void *memory) noexcept {
-  Free(memory);
-}
-void operator delete[](void *memory) noexcept {
-  Free(memory);
-}
-void operator delete(void *memory, std::size_t) noexcept {
-  Free(memory);
-}
-void operator delete[](void *memory, std::size_t) noexcept {
-  Free(memory);
-}
-
 namespace SsoClient {
 namespace {
-
-/// Counts how many pieces of memory with the secret in them were freed while it existed.
-class Watch {
-public:
-  explicit Watch(const char *secret) {
-    g_found = 0;
-    g_secret = secret;
-  }
-  Watch(const Watch &) = delete;
-  Watch &operator=(const Watch &) = delete;
-  ~Watch() { g_secret = nullptr; }
-
-  int Found() const { return g_found; }
-};
 
 const char LONG_PASSWORD[] = "correct-horse-battery-staple-and-more-than-fits-into-the-string-itself";
 const char SHORT_PASSWORD[] = "tr0ub4dor";
@@ -127,8 +51,7 @@ private:
   class Session final : public TransportSession {
   public:
     void SendRequest(const Request &request, Tarvel::Ref<Tarvel::Reader> &response) override {
-      g_isSentBodyFreed = false;
-      g_sentBody = request.body.data();
+      Testing::FollowMemory(request.body.data());
       response = Tarvel::CreateStringReader("issued:");
     }
     void SendRequestAsync(const Request &, const Completion &, Tarvel::Ref<Tarvel::System::ScheduledItem> &) override {}
@@ -138,7 +61,7 @@ private:
 class FreedMemory : public testing::TestWithParam<const char *> {};
 
 TEST_P(FreedMemory, IsFoundToContainASecretThatWasNotWiped) {
-  const Watch watch(GetParam());
+  const Testing::FreedMemoryWatch watch(GetParam());
   delete new std::string(std::string(GetParam()) + std::string(100, 'x'));
   EXPECT_GT(watch.Found(), 0);
 }
@@ -148,7 +71,7 @@ TEST_P(FreedMemory, ContainsNoPasswordOfADestroyedRequest) {
   const RequestBuilderImpl identified(Testing::HolderIdentity());
   const std::string password = GetParam();
   const TokenSpec spec = Spec();
-  const Watch watch(GetParam());
+  const Testing::FreedMemoryWatch watch(GetParam());
   for (const RequestBuilderImpl *const builder : {&plain, &identified}) {
     Request request;
     builder->BuildUserPassTokenRequest("alice", password, spec, request);
@@ -166,7 +89,7 @@ TEST_P(FreedMemory, ContainsNoPasswordOfADestroyedShortRequest) {
   const std::string password = GetParam();
   TokenSpec spec;
   spec.tokenLifetimeSec = 600;
-  const Watch watch(GetParam());
+  const Testing::FreedMemoryWatch watch(GetParam());
   {
     Request request;
     builder.BuildUserPassTokenRequest("alice", password, spec, request);
@@ -180,7 +103,7 @@ TEST_P(FreedMemory, ContainsNoPasswordOfARequestThatCannotBeBuilt) {
   const std::string password = GetParam();
   const std::string uncarriable = password + "\x01";
   TokenSpec spec = Spec();
-  const Watch watch(GetParam());
+  const Testing::FreedMemoryWatch watch(GetParam());
   Request request;
   EXPECT_THROW(builder.BuildUserPassTokenRequest("alice", uncarriable, spec, request),
                Tarvel::InvalidArgumentException);
@@ -193,12 +116,12 @@ TEST_P(FreedMemory, ContainsTheWipedRequestBeforeTheResponseIsRead) {
   const std::string password = GetParam();
   const TokenSpec spec = Spec();
   bool wasFreed = false;
-  const auto handler =
-      std::make_shared<const Testing::ResponseHandlerStandIn>([&wasFreed] { wasFreed = g_isSentBodyFreed; });
+  const auto handler = std::make_shared<const Testing::ResponseHandlerStandIn>(
+      [&wasFreed] { wasFreed = Testing::IsFollowedMemoryFreed(); });
   const SecurityTokenServiceImpl service(std::make_shared<const RequestBuilderImpl>(boost::none),
                                          std::make_shared<const ForgetfulTransport>(), handler,
                                          Tarvel::Crypto::CertificateList());
-  const Watch watch(GetParam());
+  const Testing::FreedMemoryWatch watch(GetParam());
   service.AcquireToken("alice", password, spec);
   EXPECT_TRUE(wasFreed);
   EXPECT_EQ(watch.Found(), 0);
@@ -206,7 +129,7 @@ TEST_P(FreedMemory, ContainsTheWipedRequestBeforeTheResponseIsRead) {
 
 TEST_P(FreedMemory, ContainsNoTextThatWasKeptAsASecret) {
   const std::string password = GetParam();
-  const Watch watch(GetParam());
+  const Testing::FreedMemoryWatch watch(GetParam());
   auto text = std::make_unique<Tarvel::SecretText>(password);
   auto copy = std::make_unique<Tarvel::SecretText>(*text);
   text.reset();
@@ -219,7 +142,7 @@ TEST_P(FreedMemory, ContainsNoPasswordOfACompletedAsynchronousOperation) {
   const std::string password = GetParam();
   const TokenSpec spec = Spec();
   const auto over = std::make_shared<Testing::EventCount>();
-  const Watch watch(GetParam());
+  const Testing::FreedMemoryWatch watch(GetParam());
   auto transport = std::shared_ptr<ForgetfulTransport>(new ForgetfulTransport, [over](ForgetfulTransport *object) {
     delete object;
     over->Add();
@@ -240,7 +163,7 @@ TEST_P(FreedMemory, ContainsNoPasswordOfACompletedAsynchronousOperation) {
 int CountFindsOfPosts(const char *secret, const Testing::ScriptedServer::Script &script,
                       std::optional<Testing::TlsSettings> tls, std::int64_t timeout) {
   Testing::ServiceStandIn service(script, tls, timeout);
-  const Watch watch(secret);
+  const Testing::FreedMemoryWatch watch(secret);
   for (const std::string &padding : {std::string(), std::string(40000, 'x')}) {
     auto request = std::make_unique<Request>(Testing::SampleRequest());
     request->body.reserve(padding.size() + std::strlen(secret));
@@ -288,7 +211,7 @@ int CountFindsOfAnswers(const char *secret, const std::vector<std::string> &piec
     }
   };
   Testing::ServiceStandIn service(script, tls);
-  const Watch watch(secret);
+  const Testing::FreedMemoryWatch watch(secret);
   try {
     Tarvel::Ref<Tarvel::Reader> response;
     service.CreateSession()->SendRequest(Testing::SampleRequest(), response);
@@ -392,7 +315,7 @@ private:
 TEST_P(FreedMemory, ContainsNothingOfATextThatWasReadOrParsed) {
   for (const std::size_t padding : {std::size_t(0), std::size_t(200000)}) {
     const std::string text = AnswerWithSecret(GetParam(), padding);
-    const Watch watch(GetParam());
+    const Testing::FreedMemoryWatch watch(GetParam());
     Tarvel::CreateStringReader(text);
     char buffer[7];
     Tarvel::CreateStringReader(text)->Read(buffer, sizeof buffer);
@@ -410,7 +333,7 @@ TEST_P(FreedMemory, ContainsNothingOfATextThatWasReadOrParsed) {
 TEST_P(FreedMemory, ContainsNothingOfATextThatCouldNotBeReadToItsEnd) {
   for (const std::size_t padding : {std::size_t(0), std::size_t(200000)}) {
     const std::string text = AnswerWithSecret(GetParam(), padding);
-    const Watch watch(GetParam());
+    const Testing::FreedMemoryWatch watch(GetParam());
     EXPECT_THROW(Tarvel::MakeRef<PieceReader>(text, LastRead::THROWS)->ReadToEnd(text.size()), Tarvel::IOException);
     EXPECT_EQ(watch.Found(), 0);
   }
@@ -421,7 +344,7 @@ TEST_P(FreedMemory, ContainsNothingOfADocumentThatIsRefusedAfterReferencesWereRe
   const std::string secret = GetParam();
   for (const std::string &text : {"<a x='&amp;" + secret + "' x=''/>", "<a>&amp;" + secret + "&", "<a><!--\r" + secret,
                                   "<a><?t \r" + secret, "<a x='&lt;' y='&lt;" + secret + "' <"}) {
-    const Watch watch(GetParam());
+    const Testing::FreedMemoryWatch watch(GetParam());
     Tarvel::Ref<Tarvel::Xml::Document> document;
     EXPECT_THROW(ParseXML(text, document), Tarvel::Xml::XMLParseException);
     EXPECT_EQ(watch.Found(), 0) << text;

@@ -53,7 +53,7 @@ std::string ConfirmationOf(const SamlToken &token) {
       return identity;
     }
   }
-  return certificate ? "holder-of-key of somebody else" : "holder-of-key without certificate";
+  return certificate ? "holder-of-key of an unknown identity" : "holder-of-key without certificate";
 }
 
 /// The time of the last delegation, or the token's start if there was none.

@@ -50,7 +50,7 @@ void CannedService::Serve(ServerConnection &peer) const {
   peer.Write(Asks(request, Request::ISSUE)      ? m_issued
              : Asks(request, Request::RENEW)    ? m_renewed
              : Asks(request, Request::VALIDATE) ? m_valid
-                                                : "this is no request");
+                                                : "this is not a request");
 }
 
 std::shared_ptr<const SsoClient::SamlToken> HeldToken() {

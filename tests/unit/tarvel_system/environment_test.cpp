@@ -2,9 +2,9 @@
 
 #include <tarvel/core/environment.h>
 
-#include <tarvel/core/environment.h>
 #include <tarvel/core/string_util.h>
 #include <tarvel/system/date_time.h>
+#include <tarvel/system/environment.h>
 
 #include <gtest/gtest.h>
 
@@ -16,7 +16,7 @@ namespace Tarvel::System {
 namespace {
 
 static_assert(std::is_same_v<System::Environment, Tarvel::Environment> &&
-                  std::is_same_v<ScopedEnvironment, Tarvel::ScopedEnvironment>,
+                  std::is_same_v<System::ScopedEnvironment, Tarvel::ScopedEnvironment>,
               "the former names still work");
 
 /// Later than the clock of any machine that runs this test.
