@@ -24,7 +24,7 @@ CannedServer::CannedServer(const std::string &body, bool resumesSessions)
       m_url("https://localhost:" + std::to_string(m_server.GetPort()) + "/STS/trust") {}
 
 void CannedServer::Answer(Testing::ServerConnection &connection) {
-  if (!connection.ShakeHands()) {
+  if (!connection.Handshake()) {
     return;
   }
   if (connection.WasResumed() != m_resumesSessions) {

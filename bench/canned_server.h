@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// The least that a server can do: it shakes hands, reads a request and gives the answer that it always gives.
+/// A minimal server: it completes the handshake, reads a request and sends always the same answer.
 
 #pragma once
 
@@ -11,11 +11,11 @@
 
 namespace Bench {
 
-/// Serves loopback over TLS, inside the measuring process: whoever is measured beside whom against it, the server's share
-/// is in both figures.
+/// Serves loopback over TLS, inside the measuring process. When two clients are compared, the server's share is in both
+/// figures.
 class CannedServer {
 public:
-  /// What a client must trust.
+  /// The authority that a client must trust.
   static const std::string AUTHORITY_FILE;
 
   /// @param body of the answer, of the type text/xml.
@@ -24,8 +24,8 @@ public:
 
   const std::string &GetUrl() const { return m_url; }
 
-  /// How many of the handshakes so far were not of the kind that the server was made for. A client's first one, which has
-  /// nothing to resume, is among them when the server resumes sessions.
+  /// How many handshakes so far were not of the kind that the server was made for. With resumed sessions, this includes
+  /// a client's first handshake, which has no session to resume.
   int CountOtherHandshakes() const { return m_otherHandshakes; }
 
 private:

@@ -1,5 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
-// Replaces the operators of C++ for the program; what C libraries take from malloc is not counted.
+// Replaces the allocation operators of C++ in the program; memory that C libraries get from malloc is not counted.
 
 #include "counted_heap.h"
 
@@ -13,7 +13,7 @@ namespace Bench {
 
 namespace {
 
-// The programs that count have one thread.
+// Not atomic: the programs that count have one thread.
 std::size_t held = 0;
 std::size_t most = 0;
 

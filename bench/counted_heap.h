@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// How much memory `operator new` has handed out in this program, for programs of one thread.
+/// How much memory `operator new` has allocated in this program, for programs with one thread.
 
 #pragma once
 
@@ -8,10 +8,10 @@
 
 namespace Bench {
 
-/// Forgets earlier peaks. @return the octets that are held now.
+/// Discards earlier peaks. @return the octets that are allocated now.
 std::size_t StartCountingHeap();
 
-/// The most octets that were held at once since `StartCountingHeap`.
+/// The most octets that were allocated at once since `StartCountingHeap`.
 std::size_t GetMostHeap();
 
 } // namespace Bench

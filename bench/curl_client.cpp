@@ -55,7 +55,7 @@ const std::string &CurlClient::Post() {
 template <typename T>
 void CurlClient::Set(CURLoption option, T value) {
   if (curl_easy_setopt(m_handle.get(), option, value) != CURLE_OK) {
-    throw std::runtime_error("libcurl does not take an option");
+    throw std::runtime_error("libcurl refuses an option");
   }
 }
 

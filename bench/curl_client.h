@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// The peer that an exchange is measured against: libcurl.
+/// libcurl, the peer with which an exchange is compared.
 
 #pragma once
 
@@ -11,9 +11,9 @@
 
 namespace Bench {
 
-/// Posts one SOAP request, again and again, each time over a new TLS connection. It is libcurl as a host that knows it well
-/// would use it: one handle for all requests, which keeps the parsed authorities and the sessions; the same headers and
-/// limits as ours. For one thread at a time.
+/// Posts one SOAP request repeatedly, each time over a new TLS connection. It uses libcurl as an experienced host
+/// would: one handle for all requests, which keeps the parsed authorities and the sessions, and the same headers and
+/// limits as our client. For one thread at a time.
 class CurlClient {
 public:
   /// @param authorityFile PEM certificates that the server's must chain to.
@@ -21,7 +21,7 @@ public:
   CurlClient(const std::string &url, const std::string &authorityFile, const std::string &soapAction,
              const std::string &body);
 
-  /// The body of the response, good until the next call. @throws std::runtime_error
+  /// The body of the response, valid until the next call. @throws std::runtime_error
   const std::string &Post();
 
 private:

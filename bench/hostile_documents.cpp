@@ -13,8 +13,8 @@ namespace Bench {
 
 namespace {
 
-constexpr std::size_t MANY = 250;  // of what may be there 256 times: attributes, declarations in scope, depth
-constexpr std::size_t LONG = 4000; // of what may have 4,096 octets
+constexpr std::size_t MANY = 250;  // just below the limit of 256: for attributes, declarations in scope, depth
+constexpr std::size_t LONG = 4000; // just below the limit of 4,096 octets
 
 /// The `index`th piece of a document.
 using Piece = std::function<std::string(std::size_t index)>;
@@ -23,7 +23,7 @@ Piece Always(std::string text) {
   return [text = std::move(text)](std::size_t) { return text; };
 }
 
-/// `begin`, as many pieces as fit into `octets`, and `end`.
+/// Returns `begin`, as many pieces as fit into `octets`, and `end`.
 std::string Fill(std::size_t octets, const std::string &begin, const Piece &piece, const std::string &end) {
   std::string text;
   text.reserve(octets);
@@ -38,7 +38,7 @@ std::string Fill(std::size_t octets, const std::string &begin, const Piece &piec
   return text += end;
 }
 
-/// A short name, another one for each index.
+/// A short name, a different one for each index.
 std::string Name(std::size_t index) {
   std::string name = "n";
   for (; index > 0; index /= 36) {
@@ -55,8 +55,8 @@ std::string Repeat(std::size_t count, const Piece &piece) {
   return text;
 }
 
-/// `piece` with blanks for its `~`, so many that a document of 16 MiB has not quite as many nodes and attributes as the limit
-/// lets it have. `nodes` of them are in the piece.
+/// Returns `piece` with its `~` replaced by blanks, so many that a document of 16 MiB has just fewer nodes and
+/// attributes than the limit. A piece has `nodes` of them.
 Piece Thin(std::string piece, std::size_t nodes) {
   constexpr std::size_t OCTETS_A_NODE = 17;
   const std::size_t blanks = nodes * OCTETS_A_NODE - std::min(piece.size(), nodes * OCTETS_A_NODE);
@@ -64,7 +64,7 @@ Piece Thin(std::string piece, std::size_t nodes) {
   return Always(std::move(piece));
 }
 
-/// Prefixes that a hash by FNV-1a of 32 bits, its halves combined, puts into one of 128 buckets.
+/// Prefixes that the 32-bit hash FNV-1a, with its halves combined, puts into the same one of 128 buckets.
 std::string CollidingPrefix(std::size_t index) {
   static const std::vector<std::string> prefixes = [] {
     constexpr std::uint32_t BUCKETS = 128;
@@ -84,7 +84,7 @@ std::string CollidingPrefix(std::size_t index) {
   return prefixes[index % prefixes.size()];
 }
 
-/// ` xmlns:NAME="URI"`, both by the index.
+/// Makes ` xmlns:NAME="URI"`, both from the index.
 Piece Declaring(const Piece &prefix, const Piece &uri) {
   return [=](std::size_t index) { return " xmlns:" + prefix(index) + "=\"" + uri(index) + '"'; };
 }
@@ -93,14 +93,13 @@ class ShapeList {
 public:
   explicit ShapeList(const std::string &token) : m_token(token) {}
 
-  /// Pieces in a document element of their own; `begin` is its start tag.
+  /// A document of pieces in a document element; `begin` is its start tag.
   void AddDocument(std::string name, Piece piece, std::string begin = "<r>", std::string end = "</r>") {
     m_shapes.push_back({std::move(name), [begin = std::move(begin), piece = std::move(piece), end = std::move(end)](
                                              std::size_t octets) { return Fill(octets, begin, piece, end); }});
   }
 
-  /// The token with pieces between `before` and `after`, in the place of the text `replaced`, which occurs once or is the
-  /// first of several.
+  /// The token with pieces between `before` and `after`, in place of the first occurrence of the text `replaced`.
   void AddToken(std::string name, std::string_view replaced, std::string before, Piece piece, std::string after) {
     const std::size_t at = m_token.find(replaced);
     if (at == std::string::npos) {
@@ -257,7 +256,7 @@ std::string Before(std::string_view place) {
   return std::string(place);
 }
 
-/// What passes the form of a token is digested, since the signature over the digests is genuine.
+/// The signature over the digests is genuine here, so every token of the right form is digested.
 void AddSignedContent(ShapeList &shapes) {
   const std::string value(VALUE);
   shapes.AddToken("in a name: characters", NAME_ID, "a", Always("x"), "@corp.example");
@@ -316,7 +315,7 @@ void AddSignedContent(ShapeList &shapes) {
                   Always('<' + first + ":AttributeValue>a</" + first + ":AttributeValue>"), "</saml:Attribute>");
 }
 
-/// As many nodes as there may be, which takes most memory.
+/// Documents with as many nodes as the limit allows, which take the most memory.
 void AddMostNodes(ShapeList &shapes) {
   shapes.AddDocument("most elements", Thin("<a~/>", 1));
   shapes.AddDocument("most elements with an end tag", Thin("<a~></a>", 1));
@@ -361,7 +360,7 @@ void AddMostNodes(ShapeList &shapes) {
   shapes.AddToken("most elements in a signature", IN_KEY_INFO, "", Thin("<a~/>", 1), Before(IN_KEY_INFO));
 }
 
-/// `ds:KeyInfo` may hold anything, and no digest covers it.
+/// `ds:KeyInfo` may contain anything, and no digest covers it.
 void AddSignatureContent(ShapeList &shapes) {
   const std::string after(IN_KEY_INFO);
   shapes.AddToken(
@@ -383,7 +382,7 @@ void AddSignatureContent(ShapeList &shapes) {
                     [](std::size_t j) { return ' ' + Name(j) + ":Id='_2454ad61-c2ac-c04f-0a20-fabf7f2bc96f'"; }) +
              "/>"),
       Repeat(MANY - 10, Always("</d>")) + "</r>" + after);
-  // What looks for certificates compares names.
+  // The search for certificates compares names.
   const std::string manyDeclarations = Repeat(MANY - 10, Declaring(Name, Always("http://www.w3.org/2000/09/xmldsig#")));
   shapes.AddToken("in a signature: data by the first of many declarations", "<ds:KeyInfo>",
                   "<ds:KeyInfo" + manyDeclarations + '>', Always('<' + Name(0) + ":X509Data/>"), "");

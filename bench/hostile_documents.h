@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// Documents that are made to cost their reader more than their size would.
+/// Documents that are made to cost their reader more than other documents of their size.
 
 #pragma once
 
@@ -11,14 +11,14 @@
 
 namespace Bench {
 
-/// One way to be hostile, in any size.
+/// One kind of hostile document, in any size.
 struct HostileShape {
   std::string name;
-  /// Makes a document of about that many octets, and not more.
+  /// Makes a document of about that many octets, but not more.
   std::function<std::string(std::size_t octets)> make;
 };
 
-/// All shapes: documents of their own first, then genuine tokens with something put into them.
+/// All shapes: first complete documents, then genuine tokens with hostile content inserted.
 /// @param token the text of a genuine token, of the form of tests/data/tokens/bearer.xml
 std::vector<HostileShape> MakeHostileShapes(const std::string &token);
 

@@ -1,7 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// What hostile documents cost until `CreateSamlToken` refuses or accepts them, for each octet, compared with a genuine
-/// token of 5 MB.
+/// Compares the cost, for each octet, of hostile documents until `CreateSamlToken` refuses or accepts them with that of
+/// a genuine token of 5 MB.
 
 #include "counted_heap.h"
 #include "hostile_documents.h"
@@ -33,21 +33,22 @@ namespace {
 constexpr std::size_t KIB = 1024;
 constexpr std::size_t MIB = 1024 * KIB;
 
-/// A document that takes longer is read only once, and its shape not tried in the next size: its growth is known by then.
+/// A document that takes longer is read only once, and its shape is not tried in the next size: its growth is known by
+/// then.
 constexpr double TOO_LONG_SECONDS = 2;
 
-constexpr std::size_t OUTCOME_LENGTH = 90; // of what a line shows of a refusal
+constexpr std::size_t OUTCOME_LENGTH = 90; // how much of a refusal a line shows
 
 struct Settings {
   std::array<std::size_t, 3> sizes{1 * MIB, 4 * MIB, 16 * MIB};
-  int rounds = 3; // of which the fastest counts
+  int rounds = 3; // the fastest counts
   std::string json;
 };
 
 struct Cost {
   double nanosecondsPerOctet = 0;
-  std::size_t heapOctets = 0; // at most at once, beyond the text
-  std::string refusal;        // empty when it is accepted, for what is put in need not be signed
+  std::size_t heapOctets = 0; // the peak, without the text
+  std::string refusal;        // empty when it is accepted, because inserted content need not be signed
 };
 
 double CpuSeconds() {
@@ -97,7 +98,7 @@ struct Worst {
 };
 
 struct Summary {
-  double genuine = 0; // nanoseconds an octet
+  double genuine = 0; // nanoseconds for each octet
   Worst ratio;        // to the genuine token's cost for each octet, of any size
   Worst growth;       // of the cost for each octet, from the smallest size on; see MeasureShape
   Worst heap;         // octets
@@ -114,7 +115,7 @@ void MeasureShape(const HostileShape &shape, const Tarvel::Crypto::CertificateLi
     cost = Measure(xml, trusted, settings.rounds);
     first = first == 0 ? cost.nanosecondsPerOctet : first;
     summary.ratio.Note(cost.nanosecondsPerOctet / summary.genuine, shape.name);
-    // Below a genuine token's cost that of copying the text grows, as it leaves the caches.
+    // Growth below a genuine token's cost is ignored: it is that of copying a text that no longer fits into the caches.
     summary.growth.Note(cost.nanosecondsPerOctet / std::max(first, summary.genuine), shape.name);
     summary.heap.Note(static_cast<double>(cost.heapOctets), shape.name);
     std::printf(" %9.2f", cost.nanosecondsPerOctet);
@@ -175,8 +176,8 @@ Settings ReadArguments(const std::vector<std::string> &arguments) {
   return settings;
 }
 
-/// Keeps all memory once it is the process's: what the kernel takes to hand it out anew would be most of the cost of some
-/// documents, depending on the sizes before.
+/// Keeps all memory in the process once it is allocated: otherwise the kernel's work of returning it again would be
+/// most of the cost of some documents, depending on earlier sizes.
 void KeepMemory() {
   ::mallopt(M_MMAP_MAX, 0);
   ::mallopt(M_TRIM_THRESHOLD, std::numeric_limits<int>::max());

@@ -53,7 +53,7 @@ Medians RunInterleaved(const std::vector<std::string> &arguments) {
   return reporter.GetMedians();
 }
 
-/// The value of the option `name` ("--json"), which is taken out of `arguments`; empty without it.
+/// The value of the option `name` (such as "--json"), which is removed from `arguments`; empty without it.
 std::string TakeOption(std::vector<std::string> &arguments, const std::string &name) {
   const auto option = std::find(arguments.begin(), arguments.end(), name);
   if (option == arguments.end() || option + 1 == arguments.end()) {

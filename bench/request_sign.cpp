@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// Building signed requests, beside the one signature that none can do without.
+/// Compares building a signed request with the one signature that no such request can avoid.
 
 #include "program.h"
 
@@ -28,7 +28,7 @@ namespace {
 const std::string KEY_FILE = TOKEN_DATA_DIR "/holder.key"; // RSA-2048
 constexpr std::size_t RSA_2048_BYTES = 256;
 
-/// What requests are built from, made once, as a service makes it.
+/// The parts of which requests are built. They are made once, as a service makes them.
 struct Client {
   const SsoClient::RequestBuilderImpl builder{
       SsoClient::HolderOfKeyConfig{Tarvel::Crypto::LoadPrivateKey(KEY_FILE),
@@ -63,7 +63,7 @@ void BuildExchange(benchmark::State &state) {
   }
 }
 
-/// One RSA-2048 signature over a digest that is there already, with all that can be prepared prepared.
+/// One RSA-2048 signature over a digest that exists already, with everything prepared that can be.
 class Limit {
 public:
   Limit() {

@@ -1,5 +1,6 @@
 # SPDX-License-Identifier: Apache-2.0
-# Fails unless the JSON in FILE, as scripts/bench writes it, has a ratio of the benchmark NAME: cmake -D FILE=… -D NAME=… -P.
+# Fails unless the JSON in FILE, which scripts/bench has written, has a ratio of the benchmark NAME:
+# cmake -D FILE=… -D NAME=… -P.
 file(READ "${FILE}" figures)
 string(JSON ratio GET "${figures}" "${NAME}" ratio)
 if(NOT ratio GREATER 0)

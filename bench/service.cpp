@@ -1,10 +1,10 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// Acquiring a token by password over loopback TLS, as a whole, beside what nobody can do without: the exchange of the same
-/// bytes, by libcurl, and one check of the token. The limit is the sum of the two; what both take in one loop is measured
-/// as well. Each exchange has a connection of its own, with a full handshake or a resumed one. Wall time, as the caller
-/// waits it out; the server runs in this process and its share is in all figures. Then how many tokens one service acquires
-/// in a second for several threads.
+/// Compares acquiring a token by password over loopback TLS with the work that cannot be avoided: the exchange of the
+/// same bytes, by libcurl, and one check of the token. The limit is the sum of the two; both in one loop are measured
+/// as well. Each exchange has a new connection, with a full handshake or a resumed one. The times are wall times, as
+/// the caller waits; the server runs in this process, and its share is in all figures. The last figures are the tokens
+/// that one service acquires in a second for several threads.
 
 #include "canned_server.h"
 #include "curl_client.h"
@@ -38,7 +38,7 @@ SsoClient::TokenSpec Spec() {
 }
 
 const std::string &GetTokenXml() {
-  static const std::string xml = ReadFile(TEST_DATA_DIR "/tokens/bearer-5k.xml"); // good for a century
+  static const std::string xml = ReadFile(TEST_DATA_DIR "/tokens/bearer-5k.xml"); // valid for a century
   return xml;
 }
 
@@ -58,7 +58,7 @@ const CannedServer &GetServer(bool resumes) {
   return resumes ? resumed : full;
 }
 
-/// A service as a host would set it up, with a TLS context of its own.
+/// A service as a host would create it, with its own TLS context.
 class Service {
 public:
   explicit Service(const std::string &url) {
@@ -80,7 +80,7 @@ private:
   std::shared_ptr<const SsoClient::SecurityTokenService> m_service;
 };
 
-/// Posts what the service posts.
+/// Posts the same request as the service.
 class Libcurl : public CurlClient {
 public:
   explicit Libcurl(const std::string &url)
@@ -94,7 +94,7 @@ private:
   }
 };
 
-/// Fails the benchmark when a handshake of another kind than the server was made for is among those that are measured.
+/// Fails the benchmark when a measured handshake is not of the kind that the server was made for.
 class HandshakeCheck {
 public:
   HandshakeCheck(benchmark::State &state, const CannedServer &server)
@@ -103,7 +103,7 @@ public:
   HandshakeCheck &operator=(const HandshakeCheck &) = delete;
   ~HandshakeCheck() {
     if (m_server.CountOtherHandshakes() != m_before) {
-      m_state.SkipWithError("not the handshakes that were asked for");
+      m_state.SkipWithError("a handshake was of the wrong kind");
     }
   }
 
@@ -115,7 +115,7 @@ private:
 
 void Acquire(benchmark::State &state, bool resumes) {
   const Service service(GetServer(resumes).GetUrl());
-  service.Acquire(); // after which there is a session to resume
+  service.Acquire(); // afterwards there is a session to resume
   const HandshakeCheck check(state, GetServer(resumes));
   for (auto _ : state) {
     benchmark::DoNotOptimize(service.Acquire());
@@ -128,14 +128,14 @@ void Exchange(benchmark::State &state, bool resumes) {
   const HandshakeCheck check(state, GetServer(resumes));
   for (auto _ : state) {
     if (client.Post() != GetResponse()) {
-      state.SkipWithError("not the response that was asked for");
+      state.SkipWithError("the response is wrong");
       return;
     }
   }
 }
 
-/// The limit's two parts one after the other. This takes longer than their sum: the check finds the caches as the
-/// exchange leaves them, as ours does.
+/// The limit's two parts in one loop. This takes longer than the sum of the two alone: each time, the exchange has
+/// replaced the content of the processor's caches before the check, as it does in our operation.
 void ExchangeAndVerify(benchmark::State &state, bool resumes) {
   Libcurl client(GetServer(resumes).GetUrl());
   client.Post();
@@ -176,7 +176,7 @@ void RegisterBenchmarks() {
   }
 }
 
-/// The members of one comparison.
+/// Writes the members of one comparison.
 void WriteComparison(const Medians &medians, const std::string &handshake, std::ostream &out) {
   const double ours = medians.at("AcquireToken/" + handshake + "/real_time").wallUs;
   const double libcurl = medians.at("libcurl/" + handshake + "/real_time").wallUs;

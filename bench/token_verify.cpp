@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// Verifying a token, beside the cryptography that no verification can do without, and beside xmlsec1.
+/// Compares verifying a token with the cryptography that no verification can avoid, and with xmlsec1.
 
 #include "program.h"
 #include "xmlsec_verifier.h"
@@ -71,7 +71,7 @@ void VerifyByXmlsec(benchmark::State &state, const std::string &xml) {
   }
 }
 
-/// One digest over a token's bytes and one check of an RSA-2048 signature, with all that can be prepared prepared.
+/// One digest over a token's bytes and one check of an RSA-2048 signature, with everything prepared that can be.
 class Limit {
 public:
   Limit() {
@@ -161,7 +161,7 @@ double Throughput(const Medians &medians, const std::string &name, int threads) 
   return 1e6 / medians.at(name + "/scaling/real_time/threads:" + std::to_string(threads)).wallUs;
 }
 
-/// How many times as many iterations two threads do as one does in the same time.
+/// The throughput of two threads divided by that of one.
 double Scaling(const Medians &medians, const std::string &name) {
   return Throughput(medians, name, 2) / Throughput(medians, name, 1);
 }

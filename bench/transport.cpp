@@ -1,8 +1,8 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// One POST of 4 KB over loopback TLS, with a new connection each, beside libcurl with the same settings against the same
-/// server: with full handshakes, and with resumed ones. Wall time, as the caller waits it out; the server runs in this
-/// process and its share is in both figures.
+/// Compares a POST of 4 KB over loopback TLS, each over a new connection, with libcurl, which has the same settings and
+/// the same server: with full handshakes, and with resumed ones. The times are wall times, as the caller waits; the
+/// server runs in this process, and its share is in both figures.
 
 #include "canned_server.h"
 #include "curl_client.h"
@@ -62,16 +62,16 @@ template <typename Client>
 void Post(benchmark::State &state, bool resumes) {
   const CannedServer &server = GetServer(resumes);
   Client client(server.GetUrl());
-  client.Post(); // after which there is a session to resume
+  client.Post(); // afterwards there is a session to resume
   const int otherHandshakes = server.CountOtherHandshakes();
   for (auto _ : state) {
     if (client.Post() != BODY) {
-      state.SkipWithError("not the response that was asked for");
+      state.SkipWithError("the response is wrong");
       return;
     }
   }
   if (server.CountOtherHandshakes() != otherHandshakes) {
-    state.SkipWithError("not the handshakes that were asked for");
+    state.SkipWithError("a handshake was of the wrong kind");
   }
 }
 
@@ -85,7 +85,7 @@ void RegisterBenchmarks() {
   add("libcurl/resumed", Post<Libcurl>, true);
 }
 
-/// The members of one comparison.
+/// Writes the members of one comparison.
 void WriteComparison(const Medians &medians, const std::string &handshake, std::ostream &out) {
   const double ours = medians.at("ours/" + handshake + "/real_time").wallUs;
   const double libcurl = medians.at("libcurl/" + handshake + "/real_time").wallUs;
@@ -93,7 +93,7 @@ void WriteComparison(const Medians &medians, const std::string &handshake, std::
       << "}";
 }
 
-// Times are microseconds of wall time; the ratio is to libcurl, as nobody knows the limit of the system's network.
+// Times are microseconds of wall time; the ratio is to libcurl, because the limit of the system's network is not known.
 void WriteSummary(const Medians &medians, std::ostream &out) {
   out << "{\n\"transport\": {";
   WriteComparison(medians, "full", out);

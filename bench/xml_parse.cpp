@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// Reading a text into our tree, compared with libxml2's tree, and with libxml2 and expat where they only call functions
+/// Compares reading a text into our tree with libxml2's tree, and with libxml2 and expat when they only call functions
 /// that do nothing.
 
 #include "program.h"
@@ -30,7 +30,7 @@ struct Text {
   const std::string xml;
 };
 
-/// The tokens that token_verify verifies.
+/// The same tokens as in token_verify.
 const Text *GetTexts() {
   static const Text texts[] = {{"5k", ReadFile(TOKEN_DATA_DIR "/bearer-5k.xml")},
                                {"50k", ReadFile(TOKEN_DATA_DIR "/bearer-50k.xml")},
@@ -39,7 +39,7 @@ const Text *GetTexts() {
 }
 constexpr std::size_t TEXTS = 3;
 
-/// What was read, by which the readers are compared.
+/// The content that was read; the readers must agree in it.
 struct Content {
   std::size_t elements = 0;
   std::size_t textOctets = 0;
@@ -112,7 +112,7 @@ Content CountLibxmlTree(const std::string &xml) {
   return content;
 }
 
-/// What libxml2 and expat call. With `COUNTS` they count in the `Content` that they are given, else they do nothing.
+/// The functions that libxml2 and expat call. With `COUNTS` they count in their `Content`, otherwise they do nothing.
 template <bool COUNTS>
 struct Callbacks {
   static void CountElement([[maybe_unused]] void *content) {
@@ -178,7 +178,7 @@ Content ReadByExpat(const std::string &xml) {
   return content;
 }
 
-/// Figures of readers that do not read the same would mean nothing.
+/// The figures mean nothing unless all readers read the same content.
 void RequireSameContent(const Text &text) {
   const Content ours = CountTree(text.xml);
   if (ours.elements == 0 || ours.textOctets == 0 || CountLibxmlTree(text.xml) != ours ||

@@ -63,7 +63,7 @@ bool XmlsecVerifier::Verify(const std::string &xml) const {
   if (!signature || !context) {
     return false;
   }
-  context->signKey = xmlSecKeyDuplicate(m_state->key); // the context frees it; with it, KeyInfo is not looked at
+  context->signKey = xmlSecKeyDuplicate(m_state->key); // the context frees it, and ignores KeyInfo because it has a key
   return xmlSecDSigCtxVerify(context.get(), signature) == 0 && context->status == xmlSecDSigStatusSucceeded;
 }
 

@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// The peer that token verification is measured against: the xmlsec1 library.
+/// The xmlsec1 library, the peer with which token verification is compared.
 
 #pragma once
 
@@ -12,13 +12,13 @@ namespace Bench {
 /// Verifies signed documents with xmlsec1 and a key that is loaded once.
 class XmlsecVerifier {
 public:
-  /// @param certificatePath a PEM certificate with the key to verify with.
+  /// @param certificatePath a PEM certificate, whose key verifies.
   explicit XmlsecVerifier(const std::string &certificatePath);
   XmlsecVerifier(const XmlsecVerifier &) = delete;
   XmlsecVerifier &operator=(const XmlsecVerifier &) = delete;
   ~XmlsecVerifier();
 
-  /// Parses `xml`, finds the signature of its root element and checks it, all its references included.
+  /// Parses `xml`, finds the signature of its root element and checks it with all its references.
   bool Verify(const std::string &xml) const;
 
 private:

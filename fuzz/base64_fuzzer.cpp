@@ -1,8 +1,8 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// Base64: whatever is accepted is what our own encoder, and OpenSSL's, writes for the bytes, white space apart;
-/// whatever OpenSSL's block decoder takes in whole groups without white space is accepted unless its padding is not
-/// canonical.
+/// Base64: an accepted text, without its white space, is what our encoder and OpenSSL's write for the decoded bytes. A
+/// text in whole groups without white space that OpenSSL's block decoder accepts is accepted here too, unless its
+/// padding is not canonical.
 
 #include <tarvel/core/exception.h>
 #include <tarvel/core/string_util.h>
@@ -40,7 +40,7 @@ std::string WithoutWhiteSpace(std::string_view text) {
   return rest;
 }
 
-/// Whether OpenSSL decodes `text` and writes the very same text for what it decoded.
+/// Whether OpenSSL decodes `text` and encodes the result as the same text.
 bool IsCanonicalToOpenSsl(const std::string &text) {
   Bytes bytes(text.size() + 4);
   const int decoded = EVP_DecodeBlock(bytes.data(), reinterpret_cast<const unsigned char *>(text.data()),
@@ -48,7 +48,7 @@ bool IsCanonicalToOpenSsl(const std::string &text) {
   if (decoded < 0) {
     return false;
   }
-  // EVP_DecodeBlock counts the bytes of the padding in.
+  // EVP_DecodeBlock's length includes the bytes of the padding.
   const auto pads = std::min<std::ptrdiff_t>(std::count(text.begin(), text.end(), '='), decoded);
   return EncodedByOpenSsl(bytes.data(), static_cast<std::size_t>(decoded - pads)) == text;
 }

@@ -1,7 +1,8 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// Canonicalisation: what we write for a document or a part of it, libxml2 writes too, and so it follows from expat's events.
-/// The first byte of the input chooses algorithm, prefix list and part; the rest is the document.
+/// Canonicalisation: the canonical form that we write for a document, or for a part of it, is that of libxml2 and the
+/// one that follows from expat's events. The first byte of the input chooses algorithm, prefix list and part; the rest
+/// is the document.
 
 #include "integration/signature_oracle/expat_oracle.h"
 
@@ -64,7 +65,8 @@ const Node *Next(const Node *node) {
   return node ? node->GetNextSibling() : nullptr;
 }
 
-/// libxml2 writes namespace names without the escapes that the recommendation wants: such documents cannot be compared.
+/// libxml2 writes namespace names without the escapes that the recommendation requires: such documents cannot be
+/// compared.
 bool HasNamespaceNameToEscape(const Document &document) {
   for (const Node *node = document.GetDocumentNode(); node; node = Next(node)) {
     const ElementNode *element = Tarvel::Xml::AsElement(node);
@@ -79,7 +81,7 @@ bool HasNamespaceNameToEscape(const Document &document) {
   return false;
 }
 
-/// The element number `part` of the document; the document when `part` is 0 or there are fewer.
+/// The element number `part` of the document; the document when `part` is 0 or above the number of elements.
 const Node &PartOf(const Document &document, std::size_t part) {
   std::size_t elements = 0;
   for (const Node *node = document.GetDocumentNode(); node; node = Next(node)) {

@@ -1,7 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// Date-time text: what is accepted has the published lexical form, stands for the instant that the C library computes
-/// for its fields, and is read back from its own text; what is refused ends in the one documented exception.
+/// Date-time text: an accepted text has the published lexical form, means the instant that the C library computes from
+/// its fields, and gives the same instant when it is written and read again. A refusal is the one documented exception.
 
 #include <tarvel/core/exception.h>
 #include <tarvel/system/date_time.h>
@@ -34,8 +34,8 @@ int Field(const std::cmatch &match, std::size_t group) {
   return std::atoi(match.str(group).c_str());
 }
 
-/// The fields by a second road: a regular expression for the form, and the C library for the calendar. False when the
-/// text has not the form, or a field does not survive the calendar.
+/// Reads the fields in a second way: a regular expression checks the form, and the C library the calendar. False when
+/// the text has another form, or when the calendar changes a field.
 bool ReadByCLibrary(std::string_view text, std::int64_t &utc) {
   static const std::regex form("([0-9]{4})-([0-9]{2})-([0-9]{2})T([0-9]{2}):([0-9]{2}):([0-9]{2})(\\.([0-9]+))?"
                                "(Z|([+-])([0-9]{2}):([0-9]{2}))?");
@@ -62,7 +62,8 @@ bool ReadByCLibrary(std::string_view text, std::int64_t &utc) {
                     fields.tm_mday == written.tm_mday && fields.tm_hour == written.tm_hour &&
                     fields.tm_min == written.tm_min && fields.tm_sec == written.tm_sec;
   const int zoneMinutes = Field(match, 11) * 60 + Field(match, 12);
-  const bool isYearZero = fields.tm_year == -1900; // XML Schema 1.0 has none, though its last day would end in year 1
+  // XML Schema 1.0 has no year 0, not even for the end of its last day, which would be in year 1.
+  const bool isYearZero = fields.tm_year == -1900;
   if (!kept || isYearZero || Field(match, 12) > 59 || zoneMinutes > 14 * 60) {
     return false;
   }

@@ -1,7 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// HTTP responses: whatever the pieces in which a response comes, the outcome is the same; limits hold; and nothing but
-/// the documented exception comes out.
+/// HTTP responses: the outcome is the same in whatever pieces a response arrives; limits are kept; and only the
+/// documented exception is thrown.
 
 #include "http/charset.h"
 #include "http/response_reader.h"
@@ -26,7 +26,7 @@ void Require(bool condition) {
   }
 }
 
-/// What came of `bytes`; none for a refusal.
+/// The response in `bytes`; nullopt when it is refused.
 std::optional<ResponseData> Read(std::string_view bytes, std::size_t pieceLength) {
   ResponseReader reader;
   try {
@@ -43,7 +43,7 @@ std::optional<ResponseData> Read(std::string_view bytes, std::size_t pieceLength
   }
 }
 
-/// Whatever is declared as ISO-8859-1 becomes UTF-8, and not much longer than it may.
+/// A body that is declared as ISO-8859-1 becomes UTF-8, and not longer than recoding can make it.
 void RequireUtf8Of(const ResponseData &response) {
   for (const auto &field : response.fields) {
     Require(Tarvel::Http::FindCharset(field.second).size() <= 40);

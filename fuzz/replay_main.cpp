@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// Runs a fuzz target once on each file that is named, or that lies below a folder that is named.
+/// Runs a fuzz target once on each file among its arguments, and on each file below a folder among them.
 
 #include <cstddef>
 #include <cstdint>

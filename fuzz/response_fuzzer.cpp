@@ -1,7 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// Responses: each operation ends, on any bytes, in a result or in a documented exception that leaves the caller's record
-/// alone.
+/// Responses: on any bytes, each operation ends in a result, or in a documented exception that leaves the caller's
+/// record unchanged.
 
 #include "exchange/response_handler_impl.h"
 
@@ -25,7 +25,7 @@ void Require(bool condition) {
   }
 }
 
-/// Whether `operation` returned; every other end but the documented ones ends the program.
+/// Whether `operation` returned; an exception that is not documented ends the program.
 template <typename Operation>
 bool Succeeds(const Operation &operation, const std::string &response) {
   try {

@@ -1,7 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
 /// Signatures: reading and verifying the first `Signature` element of any document ends in an answer or in a documented
-/// exception, and in the same one each time; and what a genuine signature covers is what one of the trusted keys signed.
+/// exception, the same each time; and the content that a genuine signature covers is content that a trusted key signed.
 
 #include "support/data_file.h"
 #include "xml/security/canonical_form.h"
@@ -76,7 +76,7 @@ bool HasIdentifier(const ElementNode &element, std::string_view identifier) {
   return false;
 }
 
-/// What a reference with that URI means: the whole document, or the one element that has that identifier.
+/// The target of a reference with that URI: the whole document, or the only element that has that identifier.
 const Node *FindTarget(const Document &document, std::string_view uri) {
   if (uri.empty()) {
     return document.GetDocumentNode();
@@ -92,8 +92,8 @@ const Node *FindTarget(const Document &document, std::string_view uri) {
   return target;
 }
 
-/// The canonical forms of what a signature says that it covers, without the signature. Which algorithm the signature names does
-/// not matter here: what differs in this form differs in each.
+/// The canonical forms of what a signature claims to cover, without the signature. The algorithm of the signature does
+/// not matter here: documents that differ in this form differ in every other.
 std::set<std::string> CoveredForms(const Document &document, const ElementNode &signature,
                                    const std::set<std::string> &uris) {
   Tarvel::Xml::Security::CanonicalMethod method;
@@ -136,7 +136,7 @@ Ref<Tarvel::Xml::Security::Signature> ReadSignature(const Document &document, co
   return signature;
 }
 
-/// What is covered in the documents among the seeds that the two keys signed.
+/// The forms that are covered in those seeds that one of the two keys signed.
 std::set<std::string> ReadGenuineForms() {
   std::set<std::string> all;
   for (const char *const name : {"c14n-inclusive-prefixes", "c14n-mixed", "ecdsa-p256-sha256", "reference-empty-uri",

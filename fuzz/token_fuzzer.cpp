@@ -1,7 +1,8 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// Arbitrary bytes as a token: nothing but the documented exceptions, what is accepted says what one of the tokens says that
-/// the trusted key signed and comes back byte for byte, and the road over the tree agrees with the road over the text.
+/// Arbitrary bytes as a token: only the documented exceptions are thrown; an accepted token has the facts of one of the
+/// tokens that the trusted key signed, and its text is returned byte for byte; and the tree gives the same outcome as
+/// the text.
 
 #include "support/data_file.h"
 #include "support/facts_of.h"
@@ -30,8 +31,8 @@ using namespace SsoClient;
 using Tarvel::Crypto::CertificateList;
 using Tarvel::Xml::ElementNode;
 
-/// What the tokens say that the trusted key signed and that are current: those among the seeds, and no other token can be made
-/// from a mutation of one.
+/// The facts of the seeds that the trusted key signed and that are valid now. No mutation of a seed can be another such
+/// token.
 std::set<std::string> ReadGenuineFacts(const CertificateList &trusted) {
   std::set<std::string> facts;
   for (const char *const name : {"bearer", "bearer-minimal", "c14n-inclusive-prefixes", "delegated", "full",
@@ -60,7 +61,7 @@ std::shared_ptr<const SamlToken> FromText(const std::string &xml, const Certific
   return nullptr;
 }
 
-/// @param hasCanonicalForm false when the element as a whole has none, which only this road asks for.
+/// @param hasCanonicalForm false when the element as a whole has no canonical form, which only this function needs.
 std::shared_ptr<const SamlToken> FromDom(const ElementNode &element, const CertificateList &trusted,
                                          bool &hasCanonicalForm) {
   hasCanonicalForm = true;
@@ -74,7 +75,7 @@ std::shared_ptr<const SamlToken> FromDom(const ElementNode &element, const Certi
   return nullptr;
 }
 
-/// Reads the facts without asking who vouches for them: few inputs have a signature that verifies.
+/// Reads the facts without verifying the signature, because few inputs have one that verifies.
 void ReadUnverifiedFacts(const ElementNode &element) {
   try {
     NodeFilterIterator iterator(&element, std::make_shared<SkipWsAndCommentsFilter>());
@@ -115,7 +116,7 @@ extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t *data, std::size_t size
   Require(!hasCanonicalForm || static_cast<bool>(fromText) == static_cast<bool>(fromDom));
   Require(!fromDom || Testing::FactsOf(*fromText) == Testing::FactsOf(*fromDom));
   if (fromDom) {
-    // Passed on, the canonical form says the same, or is refused.
+    // A token from the canonical form has the same facts, or is refused.
     requireGenuine(FromText(fromDom->ToXml(), trusted));
   }
   ReadUnverifiedFacts(root);

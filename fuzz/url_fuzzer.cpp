@@ -1,8 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// URLs: what is accepted can be written again from its parts and gives the same parts; the host is what follows the
-/// scheme; no part can end the line that it is sent in. Whether a text is a URI reference at all, and what its parts are,
-/// libxml2 says too.
+/// URLs: an accepted URL, written again from its parts, gives the same parts; the host is what follows the scheme; no
+/// part can end the line in which it is sent. libxml2 agrees on whether a text is a URI reference, and on its parts.
 
 #include "core/uri_reference.h"
 #include "unit/tarvel_core/uri_oracle.h"

@@ -1,9 +1,9 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// XML documents: what is accepted and what is refused is what libxml2 and expat accept and refuse, but for named
-/// differences, and so is what is made of it. What is refused ends in the one documented exception, with the place of what
-/// is wrong. What is accepted makes a tree of just the events that were reported, and is written as a document that is read
-/// as the same tree again.
+/// XML documents: the reader accepts and refuses the same documents as libxml2 and expat, and reports the same events,
+/// except for listed differences. A refusal is the one documented exception, with the position of the error. An
+/// accepted document becomes a tree of exactly the reported events; written as text and read again, it gives the same
+/// tree.
 
 #include "integration/reader_oracle/comparison.h"
 #include "integration/reader_oracle/readers.h"
@@ -47,7 +47,7 @@ void RecordBeginning(const Node &node, EventText &events) {
   }
 }
 
-/// The events that would make the tree.
+/// The events from which the tree would be made.
 EventText RecordTree(const Node &top) {
   EventText events;
   const Node *node = &top;
@@ -89,7 +89,7 @@ extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t *data, std::size_t size
   const Comparison comparison = Testing::Compare(text);
   Require(comparison.unexplained.empty(), "read otherwise than by others", comparison.unexplained);
   const Reading &ours = comparison.ours;
-  // Without a copy, so that a sanitizer sees an octet that is read outside.
+  // Without a copy, so that a sanitizer detects a read outside the text.
   const Reading inPlace = Testing::ReadInPlace(text);
   Require(inPlace.message == ours.message && inPlace.events.Get() == ours.events.Get(), "read otherwise in place",
           Testing::Escaped(text));

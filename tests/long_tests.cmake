@@ -9,7 +9,7 @@ function(ssoclient_mark cost label)
   set_tests_properties(${ARGN} PROPERTIES COST ${cost} LABELS ${label})
 endfunction()
 
-ssoclient_mark(42 waits AServiceThatStalls.EndsALegAfterFortySecondsAndNoOtherRequestSoSoon)
+ssoclient_mark(42 waits StallingService.MakesALegTimeOutAfterFortySecondsButNoOtherRequest)
 ssoclient_mark(30 in_full
   PrefixesOfDocuments.AreReadByAllReadersAlike
   GeneratedDocuments.AreReadByAllReadersAlikeButForNamedDifferences)

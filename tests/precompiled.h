@@ -1,8 +1,8 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// What nearly every test includes, read by the compiler once. Every file still includes what it uses: with
-/// -D CMAKE_DISABLE_PRECOMPILE_HEADERS=ON the tests build without this one. What only a few files need is not here, since
-/// each header makes the compiler start later on all of them.
+/// The headers that nearly every test includes, compiled once. Every file still includes what it uses: with
+/// -D CMAKE_DISABLE_PRECOMPILE_HEADERS=ON the tests build without this header. Headers that only a few files need are
+/// not here, because each one makes every compilation start more slowly.
 
 #pragma once
 

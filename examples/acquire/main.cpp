@@ -2,20 +2,24 @@
 /// @file
 /// Acquires a token by user name and password and writes its XML to standard output.
 ///
-/// As: acquire https://sts.corp.example/STS/trust authority.pem sts.pem alice@corp.example <password.txt >token.xml
+/// Usage: acquire https://sts.corp.example/STS/trust authority.pem sts.pem alice@corp.example <password.txt >token.xml
 
 #include <ssoclient/exceptions.h>
 #include <ssoclient/security_token_service.h>
 
 #include <tarvel/core/exception.h>
-#include <tarvel/core/secure_wipe.h>
+#include <tarvel/core/secret_text.h>
 #include <tarvel/crypto/certificate.h>
 #include <tarvel/ssl/ssl_context.h>
 
 #include <exception>
 #include <iostream>
 #include <memory>
+#include <stdexcept>
 #include <string>
+#include <string_view>
+
+#include <unistd.h>
 
 namespace {
 
@@ -23,40 +27,47 @@ enum ExitCode { DONE = 0, FAILED = 1, USAGE = 2, REFUSED = 3, UNREACHABLE = 4 };
 
 struct Arguments {
   std::string url;       // the service's endpoint
-  std::string authority; // PEM: whoever issued the certificate of the service's web server
-  std::string signers;   // PEM: the certificates that the service signs tokens with; not the web server's
+  std::string authority; // PEM: the authority that issued the certificate of the service's web server
+  std::string signers;   // PEM: the certificates that the service signs tokens with, not the web server's
   std::string user;
 };
 
-/// A password that leaves nothing behind in memory, however the block ends that it stands in.
-struct Password {
-  std::string text;
-  ~Password() { Tarvel::SecureWipe(text); }
-};
+/// Reads a line of standard input, octet by octet. `std::getline` would leave copies of the password in memory: in the
+/// buffer of the stream, and wherever the string was before it grew.
+Tarvel::SecretText ReadPassword() {
+  Tarvel::SecretText password;
+  char octet = 0;
+  while (read(STDIN_FILENO, &octet, 1) == 1 && octet != '\n') {
+    password.Append(std::string_view(&octet, 1));
+  }
+  if (password.Get().empty()) {
+    throw std::runtime_error("there is no password on standard input");
+  }
+  return password;
+}
 
 std::shared_ptr<const SsoClient::SamlToken> Acquire(const Arguments &arguments) {
-  // TLS and the token's signature are two different matters, with two different sets of certificates.
+  // The TLS connection and the token's signature are checked separately, each with certificates of its own.
   const Tarvel::Ref<Tarvel::Ssl::SSLContext> tls = Tarvel::Ssl::CreateSSLContext();
   tls->TrustFile(arguments.authority);
 
   SsoClient::SecurityTokenServiceConfig config;
   config.stsUrl = arguments.url;
   config.signingCertificates = Tarvel::Crypto::LoadCertificates(arguments.signers);
-  config.sslContext = tls.get(); // not owned: `tls` must outlive the service
+  config.sslContext = tls.get(); // the service holds a reference of its own
   const std::shared_ptr<const SsoClient::SecurityTokenService> service = SsoClient::CreateSecurityTokenService(config);
 
   SsoClient::TokenSpec spec;
   spec.tokenLifetimeSec = 8 * 60 * 60; // a request; the token says what was granted
 
-  Password password; // a password does not belong on a command line, where every process can read it
-  std::getline(std::cin, password.text);
-  return service->AcquireToken(arguments.user, password.text, spec); // blocks, up to four minutes
+  const Tarvel::SecretText password = ReadPassword(); // not from the command line, which every process can read
+  return service->AcquireToken(arguments.user, password.Get(), spec); // blocks for up to four minutes
 }
 
 void Print(const SsoClient::SamlToken &token) {
   std::cerr << "acquired " << token.GetId() << " for " << token.GetSubject().name << " of " << token.GetSubject().domain
             << ", valid until " << token.GetEndDate().ToString() << '\n';
-  // Whoever has a bearer token can use it. Never log it; a file with it is like a file with a password.
+  // Anybody who has a bearer token can use it: protect it like a password, and never log it.
   std::cout << token.ToXml() << std::flush;
 }
 
@@ -68,19 +79,25 @@ int main(int argc, char **argv) {
     return USAGE;
   }
   try {
-    // What is handed out here was parsed strictly, is valid now, and is signed with a trusted key.
+    // A token that is returned was parsed strictly, is valid now, and is signed with a trusted key.
     const auto token = Acquire({argv[1], argv[2], argv[3], argv[4]});
     Print(*token);
     return std::cout ? DONE : FAILED;
   } catch (const SsoClient::InvalidCredentialsException &error) {
-    std::cerr << "refused: " << error.what() << '\n'; // to ask for the password again may help
+    std::cerr << "refused: " << error.what() << '\n'; // ask for the password again
     return REFUSED;
   } catch (const SsoClient::CommunicationException &error) {
-    std::cerr << "unreachable: " << error.what() << '\n'; // to try again later may help
+    std::cerr << "unreachable: " << error.what() << '\n'; // try again later
     return UNREACHABLE;
+  } catch (const SsoClient::InvalidSignatureException &error) {
+    std::cerr << "not trusted: " << error.what() << '\n'; // are these the certificates that the service signs with?
+    return FAILED;
+  } catch (const SsoClient::SsoException &error) {
+    std::cerr << "failed: " << error.what() << '\n'; // another fault of the service, or a token that is not valid
+    return FAILED;
   } catch (const std::exception &error) {
-    // The rest: another fault of the service, a token that cannot be believed, a file that cannot be read. All of them
-    // are Tarvel::Exception, which is a std::exception.
+    // A file that cannot be read, an address that is not valid, no password. The library's exceptions all derive from
+    // Tarvel::Exception, which is a std::exception.
     std::cerr << "failed: " << error.what() << '\n';
     return FAILED;
   }

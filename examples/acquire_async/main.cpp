@@ -1,14 +1,15 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// Acquires tokens for several users at once, and tells how each operation ended.
+/// Acquires tokens for several users at once, and reports how each operation ended.
 ///
-/// As: acquire_async https://sts.corp.example/STS/trust authority.pem sts.pem alice@corp.example bob@corp.example
+/// Usage: acquire_async https://sts.corp.example/STS/trust authority.pem sts.pem alice@corp.example bob@corp.example
 ///     <passwords.txt
 
+#include <ssoclient/exceptions.h>
 #include <ssoclient/security_token_service.h>
 
 #include <tarvel/core/exception.h>
-#include <tarvel/core/secure_wipe.h>
+#include <tarvel/core/secret_text.h>
 #include <tarvel/crypto/certificate.h>
 #include <tarvel/ssl/ssl_context.h>
 
@@ -18,9 +19,13 @@
 #include <iostream>
 #include <memory>
 #include <mutex>
+#include <stdexcept>
 #include <string>
+#include <string_view>
 #include <utility>
 #include <vector>
+
+#include <unistd.h>
 
 namespace {
 
@@ -29,16 +34,24 @@ enum ExitCode { DONE = 0, FAILED = 1, USAGE = 2 };
 struct Outcome {
   std::string user;
   std::shared_ptr<const SsoClient::SamlToken> token; // null when the operation failed
-  std::shared_ptr<const Tarvel::Exception> failure;  // null when it did not
+  std::shared_ptr<const Tarvel::Exception> failure;  // null when it succeeded
 };
 
-/// A password that leaves nothing behind in memory, however the block ends that it stands in.
-struct Password {
-  std::string text;
-  ~Password() { Tarvel::SecureWipe(text); }
-};
+/// Reads a line of standard input, octet by octet. `std::getline` would leave copies of the password in memory: in the
+/// buffer of the stream, and wherever the string was before it grew.
+Tarvel::SecretText ReadPassword() {
+  Tarvel::SecretText password;
+  char octet = 0;
+  while (read(STDIN_FILENO, &octet, 1) == 1 && octet != '\n') {
+    password.Append(std::string_view(&octet, 1));
+  }
+  if (password.Get().empty()) {
+    throw std::runtime_error("there are fewer passwords on standard input than users");
+  }
+  return password;
+}
 
-/// Collects the outcomes, which come on threads of the library's pool, several at once and in any order.
+/// Collects the outcomes, which arrive on threads of the library's pool, several at once and in any order.
 class Outcomes {
 public:
   void Add(Outcome outcome) {
@@ -59,14 +72,14 @@ private:
   std::vector<Outcome> m_outcomes;
 };
 
-/// Starts one operation and returns at once. The library keeps copies of the service, the texts and the completion
-/// until the operation has ended.
+/// Starts one operation and returns at once. The library holds what the operation needs until it has ended: the
+/// service's state, copies of the texts (the password is wiped afterwards), and the completion.
 void Start(const SsoClient::SecurityTokenService &service, const std::string &user, const std::string &password,
            const std::shared_ptr<Outcomes> &outcomes) {
   SsoClient::TokenSpec spec;
   spec.tokenLifetimeSec = 8 * 60 * 60;
-  // Called exactly once, with one of the two. The exception is good during this call only; a clone lasts, and keeps
-  // the exception's class.
+  // Called once, with a token or an exception. The exception is valid only during this call; a clone lasts, and keeps
+  // its class.
   const auto end = [user, outcomes](const std::shared_ptr<const SsoClient::SamlToken> &token,
                                     const Tarvel::Exception *failure) {
     std::shared_ptr<const Tarvel::Exception> kept(failure ? failure->Clone() : nullptr);
@@ -75,16 +88,23 @@ void Start(const SsoClient::SecurityTokenService &service, const std::string &us
   service.AcquireTokenAsync(user, password, spec, end);
 }
 
-/// Whether the operation went well.
+/// Returns whether the operation succeeded.
 bool Print(const Outcome &outcome) {
-  if (outcome.failure) {
-    // Where its class matters: outcome.failure->Throw() throws it as what it is.
-    std::cerr << outcome.user << ": " << outcome.failure->what() << '\n';
-    return false;
+  try {
+    if (outcome.failure) {
+      outcome.failure->Throw(); // as the class that it is
+    }
+    std::cout << outcome.user << ": " << outcome.token->GetId() << ", valid until "
+              << outcome.token->GetEndDate().ToString() << '\n';
+    return true;
+  } catch (const SsoClient::InvalidCredentialsException &error) {
+    std::cerr << outcome.user << ": refused: " << error.what() << '\n'; // ask for the password again
+  } catch (const SsoClient::CommunicationException &error) {
+    std::cerr << outcome.user << ": unreachable: " << error.what() << '\n'; // try again later
+  } catch (const Tarvel::Exception &error) {
+    std::cerr << outcome.user << ": failed: " << error.what() << '\n'; // another fault, or a token that is not valid
   }
-  std::cout << outcome.user << ": " << outcome.token->GetId() << ", valid until "
-            << outcome.token->GetEndDate().ToString() << '\n';
-  return true;
+  return false;
 }
 
 int Run(const SsoClient::SecurityTokenServiceConfig &config, const std::vector<std::string> &users) {
@@ -92,11 +112,10 @@ int Run(const SsoClient::SecurityTokenServiceConfig &config, const std::vector<s
   {
     const auto service = SsoClient::CreateSecurityTokenService(config);
     for (const std::string &user : users) {
-      Password password; // one line of standard input for each user
-      std::getline(std::cin, password.text);
-      Start(*service, user, password.text, outcomes);
+      const Tarvel::SecretText password = ReadPassword(); // one line of standard input for each user
+      Start(*service, user, password.Get(), outcomes);
     }
-  } // Our service is gone now; what was started goes on.
+  } // The service may be released while its operations run: each of them holds what it needs.
 
   int exitCode = DONE;
   for (const Outcome &outcome : outcomes->WaitFor(users.size())) {
@@ -113,16 +132,16 @@ int main(int argc, char **argv) {
     return USAGE;
   }
   try {
-    // The one thing that the library does not copy: it must live until the last operation has ended.
-    static const Tarvel::Ref<Tarvel::Ssl::SSLContext> tls = Tarvel::Ssl::CreateSSLContext();
+    const Tarvel::Ref<Tarvel::Ssl::SSLContext> tls = Tarvel::Ssl::CreateSSLContext();
     tls->TrustFile(argv[2]);
 
     SsoClient::SecurityTokenServiceConfig config;
     config.stsUrl = argv[1];
     config.signingCertificates = Tarvel::Crypto::LoadCertificates(argv[3]);
-    config.sslContext = tls.get();
+    config.sslContext = tls.get(); // the service, and each operation, hold references of their own
     return Run(config, {argv + 4, argv + argc});
-  } catch (const std::exception &error) { // of the files and the address; an operation's failure goes to its completion
+  } catch (const std::exception &error) {
+    // A file, the address, or standard input. The failure of an operation is passed to its completion instead.
     std::cerr << "failed: " << error.what() << '\n';
     return FAILED;
   }

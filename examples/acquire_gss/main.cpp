@@ -1,9 +1,10 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// Acquires a token by a Kerberos ticket, of the default credential cache or got with a keytab, and writes its XML to
-/// standard output.
+/// Acquires a token by a Kerberos ticket, from the default credential cache or obtained with a keytab, and writes its
+/// XML to standard output.
 ///
-/// As: kinit alice && acquire_gss https://sts.corp.example/STS/trust authority.pem sts.pem HTTP@sts.corp.example >token.xml
+/// Usage: kinit alice && acquire_gss https://sts.corp.example/STS/trust authority.pem sts.pem HTTP@sts.corp.example
+/// >token.xml
 
 #include <ssoclient/exceptions.h>
 #include <ssoclient/gssapi/exceptions.h>
@@ -25,9 +26,9 @@ enum ExitCode { DONE = 0, FAILED = 1, USAGE = 2, REFUSED = 3, UNREACHABLE = 4 };
 
 struct Arguments {
   std::string url;          // the service's endpoint
-  std::string authority;    // PEM: whoever issued the certificate of the service's web server
+  std::string authority;    // PEM: the authority that issued the certificate of the service's web server
   std::string signers;      // PEM: the certificates that the service signs tokens with
-  std::string service;      // its name in Kerberos, as HTTP@sts.corp.example
+  std::string service;      // its name in Kerberos, such as HTTP@sts.corp.example
   std::string clientKeytab; // empty: the ticket is in the default credential cache
 };
 
@@ -38,13 +39,13 @@ std::shared_ptr<const SsoClient::SamlToken> Acquire(const Arguments &arguments) 
   SsoClient::SecurityTokenServiceConfig config;
   config.stsUrl = arguments.url;
   config.signingCertificates = Tarvel::Crypto::LoadCertificates(arguments.signers);
-  config.sslContext = tls.get(); // not owned: `tls` must outlive the service
+  config.sslContext = tls.get(); // the service holds a reference of its own
   const std::shared_ptr<const SsoClient::SecurityTokenService> service = SsoClient::CreateSecurityTokenService(config);
 
   SsoClient::Gssapi::SpnegoSettings settings;
   settings.service = arguments.service;
   settings.clientKeytab = arguments.clientKeytab;
-  settings.timeLimitSec = 30; // for the whole negotiation; the operation itself has no limit but that of each message
+  settings.timeLimitSec = 30; // for the whole negotiation; by itself the operation limits only each message
 
   SsoClient::TokenSpec spec;
   spec.tokenLifetimeSec = 8 * 60 * 60; // a request; the token says what was granted
@@ -53,8 +54,8 @@ std::shared_ptr<const SsoClient::SamlToken> Acquire(const Arguments &arguments) 
   const std::shared_ptr<SsoClient::Gssapi::SpnegoHandler> handler = SsoClient::Gssapi::CreateSpnegoHandler(settings);
   auto token = service->AcquireTokenByGSS(spec, *handler);
 
-  // TLS and the token's signature have told who the service is. Where Kerberos must have, too, a service that leaves its
-  // final leg out is not good enough; where not, leave this line out.
+  // TLS and the token's signature have already authenticated the service. This line also requires that Kerberos has,
+  // and so refuses a service that leaves out its final leg. Remove it if you do not need that.
   handler->RequireMutualAuthentication();
   return token;
 }
@@ -73,20 +74,20 @@ int main(int argc, char **argv) {
     std::cout << token->ToXml() << std::flush;
     return std::cout ? DONE : FAILED;
   } catch (const SsoClient::Gssapi::GssCredentialException &error) {
-    // Before InvalidCredentialsException, which it is as well: nothing was sent to the service.
-    std::cerr << "no ticket: " << error.what() << '\n'; // kinit may help
+    // Caught first, because it is an InvalidCredentialsException too. Nothing was sent to the service.
+    std::cerr << "no ticket: " << error.what() << '\n'; // run kinit
     return REFUSED;
   } catch (const SsoClient::InvalidCredentialsException &error) {
-    std::cerr << "refused: " << error.what()
-              << '\n'; // the service does not take the ticket, or does not know its owner
+    std::cerr << "refused: " << error.what() << '\n'; // the service refuses the ticket, or does not know its owner
     return REFUSED;
   } catch (const SsoClient::Gssapi::GssNegotiationException &error) {
-    std::cerr << "not negotiated: " << error.what() << '\n'; // the realm, the clocks, or a service that is another
+    std::cerr << "not negotiated: " << error.what() << '\n'; // the realm, a clock, or another service
     return UNREACHABLE;
   } catch (const SsoClient::CommunicationException &error) {
-    std::cerr << "unreachable: " << error.what() << '\n';
+    std::cerr << "unreachable: " << error.what() << '\n'; // try again later
     return UNREACHABLE;
   } catch (const std::exception &error) {
+    // Another fault of the service, a token that is not valid or not trusted, a file that cannot be read.
     std::cerr << "failed: " << error.what() << '\n';
     return FAILED;
   }

@@ -1,9 +1,10 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// Acquires a token leg by leg: for a program that runs the GSS loop itself, since its legs come from somewhere else than
-/// the ready handler, as from another mechanism or another process. Here they come from the GSSAPI, by SPNEGO.
+/// Acquires a token leg by leg, for programs that run the GSS loop themselves because they cannot use the ready
+/// handler: for example, because another process makes the legs. Here the GSSAPI makes them, by SPNEGO.
 ///
-/// As: kinit alice && negotiate https://sts.corp.example/STS/trust authority.pem sts.pem HTTP@sts.corp.example >token.xml
+/// Usage: kinit alice && negotiate https://sts.corp.example/STS/trust authority.pem sts.pem HTTP@sts.corp.example
+/// >token.xml
 
 #include <ssoclient/exceptions.h>
 #include <ssoclient/gss_negotiation_context.h>
@@ -26,11 +27,11 @@ namespace {
 
 enum ExitCode { DONE = 0, FAILED = 1, USAGE = 2, REFUSED = 3, UNREACHABLE = 4 };
 
-constexpr int MAX_LEGS = 10; // nothing else ends a negotiation with a service that goes on and on
+constexpr int MAX_LEGS = 10; // nothing else ends a negotiation with a service that never completes it
 
 using Leg = std::vector<std::uint8_t>;
 
-/// What the GSSAPI says of one of the two codes.
+/// The GSSAPI's text for a status code, major or minor by `kind`.
 std::string Describe(OM_uint32 code, int kind) {
   std::string all;
   OM_uint32 rest = 0;
@@ -68,7 +69,8 @@ public:
     gss_release_name(&minor, &m_service);
   }
 
-  /// Takes the service's leg, empty at first, and makes the next; that is empty when there is nothing to say.
+  /// Processes the service's leg (empty at first), and returns the client's next one, empty when there is nothing to
+  /// send.
   Leg Step(Leg serviceLeg) {
     static char octets[] = "\x2b\x06\x01\x05\x05\x02"; // 1.3.6.1.5.5.2, SPNEGO (RFC 4178)
     static gss_OID_desc spnego = {sizeof octets - 1, octets};
@@ -88,7 +90,7 @@ public:
     return leg;
   }
 
-  /// Whether the service, too, has proved who it is.
+  /// Whether the negotiation is complete, and the service has proved its identity.
   bool IsComplete() const { return m_isComplete; }
 
 private:
@@ -107,16 +109,16 @@ std::shared_ptr<const SsoClient::SamlToken> Negotiate(SsoClient::InternalApi::Gs
     if (!result.token) {
       continue;
     }
-    // The last leg comes with the token, and has the service's proof in it: it is easy to forget.
+    // The last leg arrives with the token. Do not skip it: it holds the proof of the service's identity.
     if (!serviceLeg.empty()) {
       client.Step(serviceLeg);
     }
     if (!client.IsComplete()) {
-      throw std::runtime_error("the service has not proved who it is");
+      throw std::runtime_error("the service has not proved its identity");
     }
     return result.token;
   }
-  throw std::runtime_error("the service issues no token after " + std::to_string(MAX_LEGS) + " legs");
+  throw std::runtime_error("the service has not issued a token after " + std::to_string(MAX_LEGS) + " legs");
 }
 
 std::shared_ptr<const SsoClient::SamlToken> Acquire(const char *url, const char *authority, const char *signers,
@@ -127,11 +129,11 @@ std::shared_ptr<const SsoClient::SamlToken> Acquire(const char *url, const char 
   SsoClient::SecurityTokenServiceConfig config;
   config.stsUrl = url;
   config.signingCertificates = Tarvel::Crypto::LoadCertificates(signers);
-  config.sslContext = tls.get(); // not owned: `tls` must outlive the context
+  config.sslContext = tls.get(); // the context holds a reference of its own
   SsoClient::TokenSpec spec;
   spec.tokenLifetimeSec = 8 * 60 * 60;
 
-  // One context is one negotiation, for one thread at a time. Its legs share one session, cookies included.
+  // A context is for one negotiation, and for one thread at a time. Its legs share one HTTP session with its cookies.
   const auto context = SsoClient::InternalApi::CreateGssNegotiationContext(config, spec);
   Client client(serviceName);
   return Negotiate(*context, client);
@@ -151,12 +153,13 @@ int main(int argc, char **argv) {
     std::cout << token->ToXml() << std::flush;
     return std::cout ? DONE : FAILED;
   } catch (const SsoClient::InvalidCredentialsException &error) {
-    std::cerr << "refused: " << error.what() << '\n';
+    std::cerr << "refused: " << error.what() << '\n'; // the service refuses the ticket, or does not know its owner
     return REFUSED;
   } catch (const SsoClient::CommunicationException &error) {
-    std::cerr << "unreachable: " << error.what() << '\n';
+    std::cerr << "unreachable: " << error.what() << '\n'; // try again later
     return UNREACHABLE;
   } catch (const std::exception &error) {
+    // The GSSAPI, another fault of the service, a token that is not valid or not trusted, a file that cannot be read.
     std::cerr << "failed: " << error.what() << '\n';
     return FAILED;
   }

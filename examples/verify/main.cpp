@@ -1,11 +1,12 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// What a service does with a token that a caller shows it: verifies it, asks whether it is meant for this service, and
+/// What a service does with a token that a caller presents: verifies it, checks that it is meant for this service, and
 /// decides by its subject and groups.
 ///
-/// As: verify sts.pem https://files.corp.example/ admins@corp.example <token.xml
+/// Usage: verify sts.pem https://files.corp.example/ admins@corp.example <token.xml
 
 #include <ssoclient/create_saml_token.h>
+#include <ssoclient/exceptions.h>
 #include <ssoclient/principal_id.h>
 
 #include <tarvel/core/exception.h>
@@ -24,14 +25,15 @@ namespace {
 
 enum ExitCode { ADMITTED = 0, REFUSED = 1, USAGE = 2, FAILED = 3 };
 
-/// "admins@corp.example".
+/// Reads a principal such as "admins@corp.example".
 SsoClient::PrincipalId ParsePrincipal(const std::string &text) {
   const std::size_t at = text.rfind('@');
   return at == std::string::npos ? SsoClient::PrincipalId{text, ""}
                                  : SsoClient::PrincipalId{text.substr(0, at), text.substr(at + 1)};
 }
 
-/// A token may name whom it is for. To take one that is for somebody else would let them pose as its subject here.
+/// A token may be restricted to audiences. A service that accepts tokens meant for others lets those others act here as
+/// the token's subject.
 bool IsForUs(const SsoClient::SamlToken &token, const std::string &audience) {
   std::set<std::string> audiences;
   token.GetAudience(audiences);
@@ -41,7 +43,7 @@ bool IsForUs(const SsoClient::SamlToken &token, const std::string &audience) {
 bool IsMember(const SsoClient::SamlToken &token, const SsoClient::PrincipalId &group) {
   std::vector<SsoClient::PrincipalId> groups;
   token.GetGroups(groups);
-  return std::find(groups.begin(), groups.end(), group) != groups.end(); // without regard to letter case
+  return std::find(groups.begin(), groups.end(), group) != groups.end(); // ignores letter case
 }
 
 /// Why the caller is refused; empty when the caller is admitted.
@@ -50,9 +52,9 @@ std::string Judge(const SsoClient::SamlToken &token, const std::string &audience
     return "the token is not for " + audience;
   }
   if (token.GetConfirmationMethod() != SsoClient::SamlToken::BEARER) {
-    // Worth something only with proof of the key in GetConfirmationCertificate, which a caller gives by signing its
-    // message, or in the TLS handshake. This program sees neither.
-    return "the token is bound to a key, and the caller has not proved to hold it";
+    // Such a token counts only with a proof of the key in GetConfirmationCertificate: the caller signs its message or
+    // authenticates by TLS with that key. This program sees neither.
+    return "the token is bound to a key, and the caller has not proved that it has the key";
   }
   if (!IsMember(token, group)) {
     return token.GetSubject().name + " is not in " + group.name;
@@ -77,7 +79,7 @@ int main(int argc, char **argv) {
 
   const std::string xml{std::istreambuf_iterator<char>(std::cin), {}};
   try {
-    // From here on for each request, on any number of threads at once.
+    // For each request from here on, on any number of threads at once.
     const std::shared_ptr<const SsoClient::SamlToken> token = SsoClient::CreateSamlToken(xml, trusted);
     const std::string refusal = Judge(*token, argv[2], ParsePrincipal(argv[3]));
     if (!refusal.empty()) {
@@ -86,10 +88,12 @@ int main(int argc, char **argv) {
     }
     std::cout << "admitted " << token->GetSubject().name << " of " << token->GetSubject().domain << '\n';
     return ADMITTED;
+  } catch (const SsoClient::InvalidSignatureException &error) {
+    std::cerr << "refused: " << error.what() << '\n'; // changed, or signed with a key that is not trusted
+  } catch (const SsoClient::ParseException &error) {
+    std::cerr << "refused: " << error.what() << '\n'; // not a token, expired, or not valid yet
   } catch (const std::exception &error) {
-    // Not well-formed, not a token, expired, changed, or signed with a key that we do not trust. A caller is best told
-    // no more than that it is refused; the reason is for our own log.
-    std::cerr << "refused: " << error.what() << '\n';
-    return REFUSED;
+    std::cerr << "refused: " << error.what() << '\n'; // not well-formed XML, or a signature of another form
   }
+  return REFUSED; // Say no more than this to the caller: the reason is for your own log.
 }

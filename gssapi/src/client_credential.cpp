@@ -4,7 +4,6 @@
 
 #include "gss_name.h"
 #include "gss_status.h"
-#include "mechanism.h"
 
 #include <ssoclient/gssapi/exceptions.h>
 
@@ -18,7 +17,7 @@ namespace SsoClient::Gssapi {
 
 namespace {
 
-/// Where the credentials are to be found, for messages.
+/// Where the credentials are, as text for messages.
 std::string DescribePlace(const SpnegoSettings &settings) {
   std::string place = settings.credentialCache.empty() ? "the default credential cache"
                                                        : "the credential cache " + settings.credentialCache;
@@ -28,7 +27,7 @@ std::string DescribePlace(const SpnegoSettings &settings) {
   return settings.client.empty() ? place : place + " for " + settings.client;
 }
 
-/// Where the credentials are to be found, for the GSSAPI.
+/// Where the credentials are, in the form that the GSSAPI uses.
 class CredentialStore {
 public:
   CredentialStore(const SpnegoSettings &settings, const std::string &cache) {
@@ -48,7 +47,7 @@ private:
   gss_key_value_set_desc m_store = {0, nullptr};
 };
 
-/// @param lifetime set to the seconds for which the credential is good; 0 when it has expired.
+/// @param lifetime set to the seconds for which the credential is still valid; 0 when it has expired.
 GssStatus Acquire(gss_name_t client, gss_OID mechanism, const CredentialStore &store, CredentialHandle &credential,
                   OM_uint32 &lifetime) {
   gss_OID_set_desc mechanisms = {1, mechanism};
@@ -77,7 +76,7 @@ ClientCredential::ClientCredential(const SpnegoSettings &settings) {
     ImportName(settings.client, GSS_KRB5_NT_PRINCIPAL_NAME, client);
   }
 
-  // Kerberos alone first: SPNEGO does not say why it finds no credential.
+  // For Kerberos first, since SPNEGO does not say why it finds no credential.
   CredentialHandle kerberos;
   OM_uint32 lifetime = 0;
   RequireSuccess(Acquire(client.Get(), KerberosMechanism(), store, kerberos, lifetime), KerberosMechanism(), settings);

@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// `ClientCredential`, what the client negotiates with.
+/// `ClientCredential`, which the client negotiates with.
 
 #pragma once
 
@@ -13,18 +13,18 @@
 
 namespace SsoClient::Gssapi {
 
-/// A credential for SPNEGO with Kerberos and no other mechanism beneath, so that nothing but the ticket that the settings
-/// name is ever offered.
+/// A credential for SPNEGO with Kerberos as its only mechanism, so that only the ticket that the settings choose is
+/// ever offered.
 class ClientCredential {
 public:
-  /// Asks the realm for a ticket when the settings name a keytab and there is none yet.
-  /// @throws GssCredentialException when there is no usable credential. There is no falling back to another.
+  /// Asks the realm for a ticket when the settings name a keytab and there is no ticket yet.
+  /// @throws GssCredentialException when there is no usable credential. No other credential is tried.
   explicit ClientCredential(const SpnegoSettings &settings);
 
   gss_cred_id_t Get() const noexcept { return m_credential.Get(); }
 
 private:
-  std::unique_ptr<const MemoryCache> m_cache; // before the credential, which uses it; null when a cache is named
+  std::unique_ptr<const MemoryCache> m_cache; // declared before its user, the credential; null when a cache is named
   CredentialHandle m_credential;
 };
 

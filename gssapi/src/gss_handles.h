@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// Owning handles for the objects of the GSSAPI: each is freed when its handle goes.
+/// Owning handles for the GSSAPI's objects: each handle frees its object.
 
 #pragma once
 
@@ -11,7 +11,7 @@
 
 namespace SsoClient::Gssapi {
 
-/// Owns one object, or none, which is null.
+/// Owns an object; null when empty.
 template <typename Object, auto RELEASE>
 class GssHandle {
 public:
@@ -22,7 +22,7 @@ public:
 
   Object Get() const noexcept { return m_object; }
 
-  /// For a function that takes the object and puts a new one in its place, or puts one into an empty handle.
+  /// For a function that replaces the object, or that stores one in an empty handle.
   Object *Slot() noexcept { return &m_object; }
 
   void Reset() noexcept {
@@ -66,7 +66,7 @@ public:
     gss_release_buffer(&minor, &m_buffer);
   }
 
-  /// For a function that allocates; the handle must be empty.
+  /// For a function that allocates octets. The handle must be empty.
   gss_buffer_t Slot() noexcept { return &m_buffer; }
 
   const std::uint8_t *begin() const noexcept { return static_cast<const std::uint8_t *>(m_buffer.value); }

@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// Names as the GSSAPI takes them.
+/// Names in the form that the GSSAPI uses: of principals, and of mechanisms.
 
 #pragma once
 
@@ -10,13 +10,21 @@
 
 namespace SsoClient::Gssapi {
 
-/// Puts the name into the empty handle.
-/// @throws Tarvel::InvalidArgumentException for a text that is no name of that form, as far as the GSSAPI can tell
-///         without asking anybody.
+/// Stores the name in the empty handle.
+/// @throws Tarvel::InvalidArgumentException when the text is not a name of that form. The GSSAPI checks that without
+///         asking the realm.
 void ImportName(const std::string &text, gss_const_OID form, NameHandle &name);
 
-/// A service's name, host-based as "HTTP@host" or a Kerberos principal as "HTTP/host@REALM".
-/// @throws Tarvel::InvalidArgumentException as above, and when one of its parts is missing.
+/// The same for the name of a service, host-based such as "HTTP@host" or a Kerberos principal such as
+/// "HTTP/host@REALM".
+/// @throws Tarvel::InvalidArgumentException as above, and when a part of the name is missing.
 void ImportServiceName(const std::string &service, NameHandle &name);
+
+/// The mechanism SPNEGO, 1.3.6.1.5.5.2 (RFC 4178). The GSSAPI's declarations take a pointer to non-const, but it does
+/// not write there.
+gss_OID SpnegoMechanism() noexcept;
+
+/// The mechanism Kerberos, 1.2.840.113554.1.2.2 (RFC 1964).
+gss_OID KerberosMechanism() noexcept;
 
 } // namespace SsoClient::Gssapi

@@ -8,13 +8,14 @@ namespace SsoClient::Gssapi {
 
 namespace {
 
-/// A status has a text for each of its parts, a handful; a GSSAPI that goes on and on is not listened to for ever.
+/// A status has a few texts, one for each of its parts. The limit ends the loop even if the GSSAPI always reports one
+/// more.
 constexpr int MAX_TEXTS = 16;
 
 /// The texts of one of the two codes.
 std::string DescribeCode(OM_uint32 code, int kind, gss_OID mechanism) {
   std::string all;
-  OM_uint32 rest = 0; // what to ask for next; 0 again after the last text
+  OM_uint32 rest = 0; // the GSSAPI's mark for the next text; 0 again after the last
   for (int i = 0; i < MAX_TEXTS; ++i) {
     GssOctets octets;
     OM_uint32 minor = 0;
@@ -34,7 +35,7 @@ std::string DescribeCode(OM_uint32 code, int kind, gss_OID mechanism) {
 } // namespace
 
 std::string DescribeStatus(const GssStatus &status, gss_OID mechanism) {
-  // The mechanism's words first: what it keeps of them may go with the next failure.
+  // The mechanism's texts first, because the next failure may overwrite them.
   const std::string minorText = status.minor == 0 ? "" : DescribeCode(status.minor, GSS_C_MECH_CODE, mechanism);
   std::string text = DescribeCode(status.major, GSS_C_GSS_CODE, GSS_C_NO_OID);
   if (!minorText.empty()) {

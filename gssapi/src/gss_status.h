@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// `GssStatus`, what a function of the GSSAPI returned, and its words.
+/// `GssStatus`, the status that a function of the GSSAPI returns, and its texts.
 
 #pragma once
 
@@ -17,9 +17,9 @@ struct GssStatus {
   bool IsError() const noexcept { return GSS_ERROR(major) != 0; }
 };
 
-/// All that the GSSAPI says of a failure: the texts of the major status, ": ", and the texts of the minor status, which is
-/// the mechanism's; several texts are put one behind the other with "; ". What it says of a minor status may belong to the
-/// last failure of this thread, so it is asked before any other call.
+/// Everything that the GSSAPI says about a failure: the texts of the major status, ": ", and the texts of the minor
+/// status, which is the mechanism's. Several texts of one status are separated by "; ". Call it right after the
+/// failure: the texts of a minor status may be those of this thread's last failure.
 std::string DescribeStatus(const GssStatus &status, gss_OID mechanism);
 
 } // namespace SsoClient::Gssapi

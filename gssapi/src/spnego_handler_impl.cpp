@@ -3,7 +3,6 @@
 #include "spnego_handler_impl.h"
 
 #include "gss_name.h"
-#include "mechanism.h"
 
 #include <ssoclient/gssapi/exceptions.h>
 
@@ -106,12 +105,12 @@ void SpnegoHandlerImpl::CheckServiceLeg(const std::vector<std::uint8_t> &service
     }
     return;
   case State::FAILED:
-    throw Tarvel::InvalidStateException("The negotiation with " + m_settings.service + " has failed before");
+    throw Tarvel::InvalidStateException("The negotiation with " + m_settings.service + " has already failed");
   }
 }
 
 std::vector<std::uint8_t> SpnegoHandlerImpl::AdvanceContext(const std::vector<std::uint8_t> &serviceLeg) {
-  std::vector<std::uint8_t> input = serviceLeg; // the GSSAPI's declarations know no const
+  std::vector<std::uint8_t> input = serviceLeg; // a copy, because the GSSAPI's declarations do not use const
   gss_buffer_desc inputBuffer = {input.size(), input.data()};
   const OM_uint32 wanted =
       GSS_C_MUTUAL_FLAG | GSS_C_INTEG_FLAG | (m_settings.dceStyle ? OM_uint32{GSS_C_DCE_STYLE} : 0);
@@ -123,7 +122,7 @@ std::vector<std::uint8_t> SpnegoHandlerImpl::AdvanceContext(const std::vector<st
                            wanted, GSS_C_INDEFINITE, GSS_C_NO_CHANNEL_BINDINGS,
                            input.empty() ? GSS_C_NO_BUFFER : &inputBuffer, nullptr, leg.Slot(), &flags, nullptr);
   if (status.IsError()) {
-    // What the GSSAPI wants the service to know of it cannot be sent: the operation ends here.
+    // A leg with which the GSSAPI reports the failure to the service is not sent: the operation ends here.
     throw GssNegotiationException("The negotiation with " + m_settings.service +
                                   " failed: " + DescribeStatus(status, SpnegoMechanism()));
   }
@@ -138,7 +137,7 @@ std::vector<std::uint8_t> SpnegoHandlerImpl::AdvanceContext(const std::vector<st
 void SpnegoHandlerImpl::CompleteWith(OM_uint32 contextFlags) {
   if ((contextFlags & GSS_C_MUTUAL_FLAG) == 0) {
     throw GssNegotiationException("The service " + m_settings.service +
-                                  " was not authenticated: the mechanism did without");
+                                  " was not authenticated: the mechanism does not support it");
   }
   m_state = State::COMPLETE;
 }

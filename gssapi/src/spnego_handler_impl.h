@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// `SpnegoHandlerImpl`, the one implementation of `SpnegoHandler`.
+/// `SpnegoHandlerImpl`, the implementation of `SpnegoHandler`.
 
 #pragma once
 
@@ -23,7 +23,7 @@ class SpnegoHandlerImpl final : public SpnegoHandler {
 public:
   using Clock = std::function<std::chrono::steady_clock::time_point()>;
 
-  /// @throws Tarvel::InvalidArgumentException as `CreateSpnegoHandler`.
+  /// @throws Tarvel::InvalidArgumentException as `CreateSpnegoHandler` does.
   explicit SpnegoHandlerImpl(const SpnegoSettings &settings, Clock clock = std::chrono::steady_clock::now);
 
   std::shared_ptr<std::vector<std::uint8_t>> NegotiateLeg(const std::vector<std::uint8_t> &serviceLeg) override;
@@ -32,10 +32,10 @@ public:
 
 private:
   enum class State {
-    NEW,      ///< no leg has been made
+    NEW,      ///< no leg has been made yet
     STARTED,  ///< the client waits for the service's leg
-    COMPLETE, ///< both sides know each other
-    FAILED    ///< for good
+    COMPLETE, ///< each side has authenticated the other
+    FAILED    ///< every further call fails too
   };
 
   std::vector<std::uint8_t> MakeLeg(const std::vector<std::uint8_t> &serviceLeg);

@@ -18,7 +18,7 @@
 
 namespace SsoClient {
 
-/// What `AsFuture` makes of the two kinds of completion.
+/// The parts of `AsFuture` that depend on the kind of completion. Not for callers.
 namespace FutureDetails {
 
 /// Stores how an operation ended, `failure` in its own class, in `promise`.
@@ -35,6 +35,7 @@ void Fulfil(std::promise<Result> &promise, const Result &result, const Tarvel::E
   }
 }
 
+/// The result of an operation with this type of completion, and `Keep`, which makes a completion that owns a promise.
 template <typename Completion>
 struct ResultOf;
 
@@ -64,8 +65,7 @@ struct ResultOf<const SecurityTokenService::ValidityCompletion &> {
 /// `std::future<std::shared_ptr<const SamlToken>>`, or a `std::future<bool>` for a verdict. For example:
 ///
 ///     auto token = AsFuture(*service, &SecurityTokenService::AcquireTokenAsync, "alice", password, spec);
-///     ...
-///     std::cout << token.get()->GetSubject().ToString() << '\n';
+///     const std::string subject = token.get()->GetSubject().ToString();
 ///
 /// `get` throws the operation's failure in its own class, for example `InvalidCredentialsException`. When the operation ends
 /// without a call of its completion (see `SecurityTokenService::TokenCompletion`), it throws `std::future_error` with the code
@@ -75,7 +75,7 @@ struct ResultOf<const SecurityTokenService::ValidityCompletion &> {
 /// may need the thread that waits. After `fork`, the child must not wait for a future of its parent, which never becomes ready
 /// there.
 /// @param operation one of the operations of `SecurityTokenService` with "Async"
-/// @param arguments all its arguments but the completion. They are copied or shared, as by the operation itself.
+/// @param arguments all its arguments but the completion. The operation copies or shares them.
 /// @throws what `operation` throws itself, for example Tarvel::InvalidStateException when the pool cannot start a thread.
 template <typename... Parameters, typename... Arguments>
 auto AsFuture(const SecurityTokenService &service, void (SecurityTokenService::*operation)(Parameters...) const,

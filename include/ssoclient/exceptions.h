@@ -8,8 +8,8 @@
 /// `Tarvel::Xml::Security::XmlSecurityException`. Catch `Tarvel::Exception`, the base of all of them, to catch every failure
 /// of the library except `std::bad_alloc`.
 ///
-/// An exception carries a message and no further fields. The comments below say how messages begin that the library promises
-/// to keep.
+/// An exception carries a message and no further fields. The comments below quote how messages begin, where programs may rely
+/// on it.
 
 #pragma once
 
@@ -31,8 +31,8 @@ class SSOCLIENT_API InvalidTokenException : public SsoException {
   TARVEL_EXCEPTION_BODY(InvalidTokenException, SsoException);
 };
 
-/// A token whose signature does not verify. The message begins with "Failed to verify signature: " when no trusted key made
-/// the signature or the token was changed, and with "Signature verification error. " in every other case.
+/// A token whose signature does not verify. The message begins with "Failed to verify signature: " when token, signature and
+/// trusted keys do not match, and with "Signature verification error. " when the signature cannot be checked.
 class SSOCLIENT_API InvalidSignatureException : public InvalidTokenException {
   TARVEL_EXCEPTION_BODY(InvalidSignatureException, InvalidTokenException);
 };

@@ -25,8 +25,8 @@ namespace SsoClient {
 ///
 /// The operations without "Async" run on the caller's thread. They wait up to four minutes for each message, and throw
 /// - `InvalidCredentialsException` when the service refuses the caller's credentials,
-/// - `CommunicationException` when the service cannot be reached, or answers with an HTTP status other than success or the one
-///   for faults,
+/// - `CommunicationException` when the service cannot be reached, or returns an HTTP status that is neither success (2xx) nor
+///   500, with which faults are sent,
 /// - `InvalidSignatureException` when the token is not signed with the key of one of the trusted certificates,
 /// - `SsoException` for every other fault, for a response that does not have the expected form, and for a token that is
 ///   malformed, expired or not valid yet,
@@ -94,38 +94,40 @@ public:
   /// holder-of-key identity of the token.
   virtual std::shared_ptr<const SamlToken> RenewToken(const SamlToken &token, std::int64_t lifetimeSec) const = 0;
 
-  /// Runs `AcquireToken` on a thread of the pool. `completion` is called there once, with the token or the failure, and not at
-  /// all for an exception that is not a `Tarvel::Exception`. It must not wait for another asynchronous operation.
-  /// The copy of the password is overwritten when the operation ends.
+  /// Runs `AcquireToken` on a thread of the pool. `completion` is called there once, with the token and null, or with
+  /// null and the failure. It is not called for an exception that is not a `Tarvel::Exception`, and must not wait for
+  /// another asynchronous operation. The copy of the password is overwritten when the operation ends.
   virtual void AcquireTokenAsync(const std::string &username, const std::string &password, const TokenSpec &spec,
                                  const TokenCompletion &completion) const = 0;
 
-  /// Runs `AcquireTokenByGSS` on a thread of the pool, on which `handler` is called, too. `completion` is called there once,
-  /// with the token or the failure, and not at all for an exception that is not a `Tarvel::Exception`, which includes those of
-  /// the handler. It must not wait for another asynchronous operation. `handler` is shared until the operation ends.
+  /// Runs `AcquireTokenByGSS` on a thread of the pool, and calls `handler` there. `completion` is called there once,
+  /// with the token and null, or with null and the failure. It is not called for an exception that is not a
+  /// `Tarvel::Exception`, not even for one of the handler, and must not wait for another asynchronous operation.
+  /// `handler` is shared until the operation ends.
   virtual void AcquireTokenByGssAsync(const TokenSpec &spec, const std::shared_ptr<NegotiationHandler> &handler,
                                       const TokenCompletion &completion) const = 0;
 
-  /// Runs `AcquireTokenByCertificate` on a thread of the pool. `completion` is called there once, with the token or the
-  /// failure, and not at all for an exception that is not a `Tarvel::Exception`. It must not wait for another asynchronous
-  /// operation.
+  /// Runs `AcquireTokenByCertificate` on a thread of the pool. `completion` is called there once, with the token and
+  /// null, or with null and the failure. It is not called for an exception that is not a `Tarvel::Exception`, and must
+  /// not wait for another asynchronous operation.
   virtual void AcquireTokenByCertificateAsync(const TokenSpec &spec, const TokenCompletion &completion) const = 0;
 
-  /// Runs `AcquireTokenByToken` on a thread of the pool. `completion` is called there once, with the new token or the failure,
-  /// and not at all for an exception that is not a `Tarvel::Exception`. It must not wait for another asynchronous operation.
-  /// `token` is shared until the operation ends.
+  /// Runs `AcquireTokenByToken` on a thread of the pool. `completion` is called there once, with the new token and
+  /// null, or with null and the failure. It is not called for an exception that is not a `Tarvel::Exception`, and must
+  /// not wait for another asynchronous operation. `token` is shared until the operation ends.
   virtual void AcquireTokenByTokenAsync(const std::shared_ptr<const SamlToken> &token, const TokenSpec &spec,
                                         const TokenCompletion &completion) const = 0;
 
-  /// Runs `ValidateSubject` on a thread of the pool. `completion` is called there once, with the verdict or the failure, and
-  /// not at all for an exception that is not a `Tarvel::Exception`. It must not wait for another asynchronous operation.
-  /// An invalid token is a verdict, not a failure. `token` is shared until the operation ends.
+  /// Runs `ValidateSubject` on a thread of the pool. `completion` is called there once, with the verdict and null, or
+  /// with an empty verdict and the failure; an invalid token is a verdict, not a failure. It is not called for an
+  /// exception that is not a `Tarvel::Exception`, and must not wait for another asynchronous operation. `token` is
+  /// shared until the operation ends.
   virtual void ValidateSubjectAsync(const std::shared_ptr<const SamlToken> &token,
                                     const ValidityCompletion &completion) const = 0;
 
-  /// Runs `RenewToken` on a thread of the pool. `completion` is called there once, with the new token or the failure, and not
-  /// at all for an exception that is not a `Tarvel::Exception`. It must not wait for another asynchronous operation. `token`
-  /// is shared until the operation ends.
+  /// Runs `RenewToken` on a thread of the pool. `completion` is called there once, with the new token and null, or with
+  /// null and the failure. It is not called for an exception that is not a `Tarvel::Exception`, and must not wait for
+  /// another asynchronous operation. `token` is shared until the operation ends.
   virtual void RenewTokenAsync(const std::shared_ptr<const SamlToken> &token, std::int64_t lifetimeSec,
                                const TokenCompletion &completion) const = 0;
 
@@ -137,7 +139,7 @@ protected:
 };
 
 /// A client of the service that `config` describes. Nothing is connected or sent yet. `config` is copied; the service takes its
-/// own reference to the SSL context and holds it as long as it lives, including operations that are under way.
+/// own reference to the SSL context, which lasts as long as the service and its operations.
 /// @throws Tarvel::InvalidArgumentException for an HTTPS address without an SSL context, and for an identity without key or
 ///         certificate.
 /// @throws Tarvel::Http::MalformedURLException for a malformed address.

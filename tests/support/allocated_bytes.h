@@ -1,7 +1,8 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// How much of the heap the process holds, to the byte. This header replaces the allocation functions of the C library by
-/// ones that count, for all libraries of the program too: exactly one source file of a program includes it.
+/// Counts the heap memory that the process has allocated, to the byte. This header replaces the C library's allocation
+/// functions with ones that count, also for all libraries of the program: exactly one source file of a program includes
+/// it.
 
 #pragma once
 
@@ -16,8 +17,9 @@
 
 namespace Testing {
 
-/// What malloc and its kin have handed out to all threads and not got back. A sanitizer has an allocator of its own, which
-/// is not replaced: always 0 then, and AddressSanitizer's check for leaks at the program's end stands in.
+/// The bytes that malloc and similar functions have allocated on all threads and that are not freed. A sanitizer has
+/// its own allocator, which is not replaced: then this is always 0, and AddressSanitizer checks for leaks at the
+/// program's end.
 inline std::atomic<std::size_t> &AllocatedBytes() {
   static std::atomic<std::size_t> bytes{0};
   return bytes;
@@ -31,7 +33,7 @@ inline std::size_t CountAllocatedBytes() {
 
 #ifndef TESTING_IS_SANITIZED
 #pragma GCC visibility push(default) // for the shared libraries
-// What the C library's own functions are also called, so that those that replace them can use them.
+// Other names of the C library's own functions, with which their replacements call them.
 extern "C" {
 void *__libc_malloc(std::size_t size);
 void *__libc_calloc(std::size_t count, std::size_t size);

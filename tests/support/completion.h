@@ -16,10 +16,10 @@
 
 namespace Testing {
 
-/// Far longer than anything here takes, also under a sanitizer on a machine that is busy.
+/// Far longer than anything here takes, even under a sanitizer on a busy machine.
 constexpr std::chrono::seconds PATIENCE{60};
 
-/// Makes a handler, and tells how it was called. The handler may outlive this.
+/// Makes a handler, and reports how it was called. The handler may outlive this object.
 class Completion {
 public:
   /// For a connect or a handshake.
@@ -31,7 +31,7 @@ public:
     return [state = m_state](std::size_t count, const Tarvel::Exception *failure) { state->Note(count, failure); };
   }
 
-  /// Whether the handler has been called, which is waited for.
+  /// Waits for the handler's call; false when it was not called in time.
   bool Wait() const;
 
   int GetCalls() const;
@@ -62,7 +62,7 @@ private:
   std::shared_ptr<State> m_state = std::make_shared<State>();
 };
 
-/// Waits until all that was due on the I/O threads has run: both must be free at the same time.
+/// Waits until everything queued on the I/O threads has run: both must be idle at the same time.
 bool DrainIoThreads();
 
 } // namespace Testing

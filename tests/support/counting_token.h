@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// `CountingToken`, a token full of secrets that counts who asks.
+/// `CountingToken`, a token full of secrets that counts how often it is described.
 
 #pragma once
 
@@ -55,7 +55,7 @@ private:
   const ConfirmationType m_confirmation = HOLDER_OF_KEY;
 };
 
-/// What a log line may say of a `CountingToken`.
+/// The description of a `CountingToken` that a log line may have.
 constexpr const char *COUNTING_TOKEN_DESCRIPTION =
     "SamlToken [subject={Name: bob; Domain:corp.example}, groups=[{Name: bob; Domain:corp.example}], "
     "delegationChain=[{Name: bob; Domain:corp.example} at 2026-01-02T03:04:05.006Z], "

@@ -1,5 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
-// The only source of the tests that is compiled with TEST_DATA_DIR: no other one depends on where the project is.
+// The only source of the tests that is compiled with TEST_DATA_DIR: no other one depends on the project's path.
 
 #include "support/data_file.h"
 

@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// The files under tests/data: where they are, and what they hold.
+/// The files under tests/data: their paths and their content.
 
 #pragma once
 

@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// In which order a class declares its virtual functions and its fields, as callers built against it rely on.
+/// Checks the order in which a class declares its virtual functions and its fields: compiled callers rely on it.
 
 #pragma once
 
@@ -12,8 +12,8 @@
 
 namespace Testing {
 
-/// The index of a virtual function in its class's table, by the Itanium C++ ABI: a pointer to it holds the offset in the
-/// table, on some processors with its lowest bit set.
+/// The index of a virtual function in its class's table. In the Itanium C++ ABI, a pointer to it contains the offset in
+/// the table, on some processors with the lowest bit set.
 template <typename Function>
 std::size_t SlotOf(Function function) {
   std::ptrdiff_t words[2];

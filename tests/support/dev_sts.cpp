@@ -50,7 +50,7 @@ int ExitCodeOf(int status) noexcept {
   return WIFEXITED(status) ? WEXITSTATUS(status) : 128 + WTERMSIG(status);
 }
 
-/// Both ends of a pipe; what is not taken is closed.
+/// Both ends of a pipe; an end that is not released is closed.
 struct Pipe {
   Pipe() { Require(::pipe2(ends.data(), O_CLOEXEC) == 0, "no pipe"); }
   Pipe(const Pipe &) = delete;
@@ -80,7 +80,7 @@ DevSts::DevSts(const std::vector<std::string> &arguments) {
 DevSts::~DevSts() {
   const int exitCode = Stop();
   if (exitCode != 0) {
-    // A destructor, maybe behind the last test, has no other way to fail the program.
+    // A destructor, which may run after the last test, has no other way to fail the program.
     std::fprintf(stderr, "The development service has ended with %d\n%s", exitCode, GetLog().c_str());
     std::fflush(nullptr);
     std::_Exit(EXIT_FAILURE);

@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// The development token service as a process of its own, for as long as a test needs it.
+/// The development token service as a separate process, as long as a test needs it.
 
 #pragma once
 
@@ -15,46 +15,47 @@ namespace Testing {
 /// How a process has ended.
 struct ProcessEnd {
   int exitCode = -1; ///< 128 plus the signal when one ended it
-  std::string out;   ///< what came behind the ready line
+  std::string out;   ///< the output after the ready line
 };
 
-/// A running service. A test program that has one names it in CMake: ssoclient_needs_devsts(TARGET).
+/// A running service. A test program that uses one says so in CMake: ssoclient_needs_devsts(TARGET).
 class DevSts {
 public:
-  /// Starts the service on a free port and waits until it is ready. The keys are made by the first start in a build and
-  /// used by all others, unless `arguments`, which come behind --until-eof, name another --state.
-  /// @throws std::runtime_error with the service's exit code and own words when it does not get ready within a minute
+  /// Starts the service on a free port and waits until it is ready. The first start in a build makes the keys and all
+  /// others use them, unless `arguments`, which come after --until-eof, give another --state.
+  /// @throws std::runtime_error with the service's exit code and output when it is not ready within two minutes
   explicit DevSts(const std::vector<std::string> &arguments = {});
   DevSts(const DevSts &) = delete;
   DevSts &operator=(const DevSts &) = delete;
-  /// Ends the service, by force if need be. Should the test die before, the service sees its standard input end. A service
-  /// that does not end well, as when a sanitizer has found something in it, ends the test program with a failure.
+  /// Ends the service, by force if necessary. If the test program dies earlier, the service ends because its standard
+  /// input ends. A service that ends with a failure, for example after a sanitizer's report, ends the test program with
+  /// a failure.
   ~DevSts();
 
   /// The path of the service's program.
   static const char *GetProgram() noexcept;
 
   const std::string &GetUrl() const noexcept { return m_url; }
-  /// The address under which this one fault is met.
+  /// The address at which the service gives this wrong answer.
   std::string FaultUrl(std::string_view fault) const { return m_url + "/fault/" + std::string(fault); }
   int GetPort() const noexcept { return m_port; }
   pid_t GetProcess() const noexcept { return m_process; }
   const std::string &GetThumbprint() const noexcept { return m_thumbprint; }
   const std::string &GetReadyLine() const noexcept { return m_readyLine; }
 
-  /// The path of a file of the state folder, as "authority.crt", "signing.crt", "client.key", "other-client.crt".
+  /// The path of a file of the state folder, such as "authority.crt", "signing.crt", "client.key", "other-client.crt".
   std::string PathOf(std::string_view file) const { return m_folder + "/" + std::string(file); }
   /// The content of such a file.
   std::string ReadStateFile(std::string_view file) const;
 
-  /// What the service has written to standard error so far.
+  /// The service's output on standard error so far.
   std::string GetLog() const;
 
-  /// Sends the signal, or with 0 ends standard input, and waits for the end of the process.
+  /// Sends the signal, or with 0 closes the service's standard input, and waits for the end of the process.
   ProcessEnd End(int signal = 0);
 
 private:
-  /// The path of the state folder that services use which are given none.
+  /// The path of the state folder of services that are started without --state.
   static const char *GetUsualState() noexcept;
 
   void Start(const std::vector<std::string> &arguments);

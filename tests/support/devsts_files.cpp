@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 // The only source that is compiled with SSOCLIENT_DEVSTS and SSOCLIENT_DEVSTS_STATE, the paths of the service's program
-// and of its usual state folder. Neither is defined when there is no such service.
+// and of its usual state folder. Neither is defined when the service is not built.
 
 #include "support/dev_sts.h"
 

@@ -10,7 +10,7 @@
 
 namespace Testing {
 
-/// Every fact of the token but its text, one a line, so that two tokens say the same when these texts are equal.
+/// Every fact of the token except its text, one on each line: two tokens have the same facts if these texts are equal.
 std::string FactsOf(const SsoClient::SamlToken &token);
 
 } // namespace Testing

@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// `FixedEnvironment`, a clock that stands still and UUIDs that count from one.
+/// `FixedEnvironment`, a stopped clock and UUIDs that count from one.
 
 #pragma once
 
@@ -15,8 +15,8 @@ namespace Testing {
 /// 2026-01-02T03:04:05.006Z in microseconds since 1970.
 constexpr std::int64_t FIXED_NOW = 1767323045006000;
 
-/// While it lives, it is always 2026-01-02T03:04:05.006Z, and the n-th UUID (n up to 9) ends in n and is otherwise zeros
-/// where the UUID's form allows.
+/// While it exists, the time is always 2026-01-02T03:04:05.006Z, and the n-th UUID (n up to 9) ends in n and has zeros
+/// everywhere else where the UUID's form allows.
 class FixedEnvironment {
 public:
   FixedEnvironment() : m_scope(Make()) {}

@@ -34,7 +34,7 @@ void RunAndExit(const std::function<void()> &body) noexcept {
 } // namespace
 
 pid_t StartChild(const std::function<void()> &body) {
-  std::fflush(stdout); // else the child would print it, too
+  std::fflush(stdout); // otherwise the child would print the buffer too
   const pid_t child = ::fork();
   if (child < 0) {
     throw std::system_error(errno, std::system_category(), "fork");

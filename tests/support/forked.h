@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// Children of the test process, made by `fork` as a host makes them, and memory that they share with it.
+/// Child processes of the test, made by `fork` as a host makes them, and memory that they share with it.
 
 #pragma once
 
@@ -13,15 +13,15 @@
 
 namespace Testing {
 
-/// Whether a child has memory to work with though other threads of its parent may allocate in the moment of the fork. The
-/// C library sees to that. AddressSanitizer's allocator does not: its locks may stay locked in the child.
+/// Whether a child can allocate memory even if other threads of its parent allocate at the moment of the fork. The C
+/// library ensures this. AddressSanitizer's allocator does not: its locks may stay locked in the child.
 constexpr bool MAY_FORK_WHILE_OTHERS_ALLOCATE = !IS_SANITIZED;
 
-/// What became of a child: "" when its body ran to the end and all that it expected was so, else what ended it.
+/// How a child ended: "" when its body ran to the end and all its expectations were met, otherwise the reason.
 using ChildOutcome = std::string;
 
-/// Forks, and runs `body` in the child, which then ends without destructors and without functions of `atexit`. A child
-/// that hangs is killed after a minute.
+/// Forks, and runs `body` in the child, which then ends without destructors and without the functions of `atexit`. A
+/// child that hangs is killed after a minute.
 /// @throws std::system_error
 pid_t StartChild(const std::function<void()> &body);
 
@@ -32,11 +32,11 @@ inline ChildOutcome RunInChild(const std::function<void()> &body) {
   return WaitForChild(StartChild(body));
 }
 
-/// A page of memory that is the same in parent and children.
+/// A page of memory that parent and children share.
 void *MapSharedPage();
 void UnmapSharedPage(void *page) noexcept;
 
-/// A `T` that parent and children see alike, such as a `std::atomic<int>`.
+/// A `T` that parent and children share, such as a `std::atomic<int>`.
 template <typename T>
 class Shared {
 public:

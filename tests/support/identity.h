@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// The holder-of-key identity that tests sign requests with.
+/// The holder-of-key identity with which tests sign requests.
 
 #pragma once
 

@@ -20,14 +20,15 @@
 namespace Testing {
 namespace {
 
-/// How often another port is tried, when somebody else was faster.
+/// How many ports are tried, because another process may take one first.
 constexpr int PORT_TRIALS = 5;
 
-/// What Kerberos tolerates by default, and what a client must that gets a ticket from a centre with a wrong clock.
+/// The clock skew that Kerberos tolerates by default, and the one that a client needs to get a ticket from a centre
+/// with a wrong clock.
 constexpr int USUAL_CLOCK_SKEW_SEC = 300;
 constexpr int ANY_CLOCK_SKEW_SEC = 1000000;
 
-/// A port of 127.0.0.1 that nobody uses at the moment.
+/// A port of 127.0.0.1 that is not in use now.
 int FindFreePort() {
   const int descriptor = socket(AF_INET, SOCK_STREAM | SOCK_CLOEXEC, 0);
   sockaddr_in address{};
@@ -43,7 +44,7 @@ int FindFreePort() {
   return ntohs(address.sin_port);
 }
 
-/// Daemons are not in everybody's search path.
+/// Also searches the folders of daemons, which are not in every user's search path.
 std::string FindProgram(const std::string &name) {
   for (const char *folder : {"/usr/sbin/", "/usr/bin/", "/usr/local/sbin/", "/usr/local/bin/"}) {
     if (access((folder + name).c_str(), X_OK) == 0) {
@@ -53,7 +54,7 @@ std::string FindProgram(const std::string &name) {
   throw std::runtime_error(name + " is not installed");
 }
 
-/// What a program is told and who has started it.
+/// A program's arguments and environment.
 struct Command {
   std::vector<std::string> arguments; ///< the program's path first
   std::vector<std::string> environment;
@@ -83,7 +84,7 @@ Child Start(Command command) {
   const pid_t id = fork();
   if (id == 0) {
     prctl(PR_SET_PDEATHSIG, SIGKILL);
-    if (getppid() == parent) { // else it has gone before it could be watched
+    if (getppid() == parent) { // otherwise the parent has ended already, and no signal would come
       dup2(open("/dev/null", O_RDONLY), STDIN_FILENO);
       dup2(pipe[1], STDOUT_FILENO);
       dup2(pipe[1], STDERR_FILENO);
@@ -95,7 +96,7 @@ Child Start(Command command) {
   return {id, pipe[0]};
 }
 
-/// Reads until `text` has come, or to the end when `text` is empty.
+/// Reads until `text` has arrived, or to the end when `text` is empty.
 std::string ReadUntil(int descriptor, const std::string &text) {
   std::string all;
   std::array<char, 4096> buffer{};
@@ -147,7 +148,7 @@ void KerberosRealm::ChangeKey(const std::string &principal) const {
 }
 
 void KerberosRealm::GetTicket(const std::string &principal, const std::string &keytab, const std::string &cache) const {
-  // Asks for more than there is, so that the centre's limit decides.
+  // Requests a longer lifetime than the centre allows, so that the centre's limit decides.
   Run("kinit", {"-k", "-t", keytab, "-c", cache, "-l", "1d", principal}, "any_clock.conf");
 }
 

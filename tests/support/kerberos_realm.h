@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// `KerberosRealm`, a realm of our own: MIT's key distribution centre on loopback, in a folder and on a port of its own.
+/// `KerberosRealm`, a realm for one test: MIT's key distribution centre on loopback, with its own folder and port.
 
 #pragma once
 
@@ -14,39 +14,40 @@ namespace Testing {
 
 struct RealmSettings {
   std::string name = "EXAMPLE.TEST";
-  /// How far the centre's clock goes ahead of the machine's, in seconds; negative for behind.
+  /// By how many seconds the centre's clock is fast, compared with the machine's; negative when it is slow.
   int clockOffsetSec = 0;
   /// Whether clients adopt the centre's clock, as they do by default.
   bool adoptsClock = true;
 };
 
-/// Needs no root and touches nothing of the machine's configuration: as long as it lives, KRB5_CONFIG of this process
-/// names the realm's configuration, and the other variables of Kerberos are unset. So it is made before the test starts
-/// threads, and there is one at a time. The centre ends with this object, and with this process however that ends.
+/// Needs no root and does not change the machine's configuration: as long as it exists, KRB5_CONFIG of this process is
+/// the realm's configuration, and the other variables of Kerberos are unset. So it must be made before the test starts
+/// threads, and only one may exist at a time. The centre ends with this object, and also when this process is killed.
 ///
-/// Principals are named without their realm, files of the realm's folder as Kerberos does it: "FILE:…".
+/// Principals are given without their realm, files of the realm's folder in Kerberos's form: "FILE:…".
 class KerberosRealm {
 public:
-  /// @throws std::runtime_error with the output of what failed
+  /// @throws std::runtime_error with the output of the program that failed
   explicit KerberosRealm(const RealmSettings &settings = {});
   KerberosRealm(const KerberosRealm &) = delete;
   KerberosRealm &operator=(const KerberosRealm &) = delete;
   ~KerberosRealm();
 
-  /// Registers a principal with a random key, and puts that key into a keytab of its own.
+  /// Registers a principal with a random key, and puts that key into a new keytab.
   /// @return the keytab's name
   std::string AddPrincipal(const std::string &principal) const;
 
-  /// Gives a principal another key, which no keytab has.
+  /// Gives a principal a new key, which is in no keytab.
   void ChangeKey(const std::string &principal) const;
 
-  /// Gets a ticket into `cache`, also from a centre whose clock is wrong. It is good for an hour by the centre's clock.
+  /// Gets a ticket into `cache`, also from a centre whose clock is wrong. It is valid for an hour by the centre's
+  /// clock.
   void GetTicket(const std::string &principal, const std::string &keytab, const std::string &cache) const;
 
-  /// Ends the centre, so that nobody answers on its port.
+  /// Ends the centre, so that its port does not answer any more.
   void Stop() noexcept;
 
-  /// What a client uses that names no cache. There is none until somebody gets a ticket into it.
+  /// The cache that a client uses by default. It does not exist until a ticket is put into it.
   std::string GetDefaultCache() const { return NameFile("default_cache"); }
   std::string NameFile(const std::string &name) const { return "FILE:" + (m_folder / name).string(); }
   pid_t GetCentre() const noexcept { return m_centre; }
@@ -59,7 +60,7 @@ private:
            const std::string &configuration = "krb5.conf") const;
   std::vector<std::string> MakeEnvironment(const std::string &configuration) const;
   void StartCentreOnSomePort();
-  std::string StartCentre(); // returns what it has printed
+  std::string StartCentre(); // returns its output
   void Clean() noexcept;
 
   const RealmSettings m_settings;

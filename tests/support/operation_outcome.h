@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// `OperationOutcome`, what the completions of asynchronous operations were told.
+/// `OperationOutcome`, the results that the completions of asynchronous operations got.
 
 #pragma once
 
@@ -24,7 +24,7 @@
 
 namespace Testing {
 
-/// Makes completions, which may outlive it. All of them note here.
+/// Makes completions, which may outlive it. All of them record their results here.
 class OperationOutcome {
 public:
   SsoClient::SecurityTokenService::TokenCompletion ForToken() const {
@@ -38,7 +38,7 @@ public:
     };
   }
 
-  /// What the completions were told, one after the other, once there are that many: "RESULT" of a success, "RESULT and
+  /// Waits for `count` calls of completions and returns their results, in order: "RESULT" of a success, "RESULT and
   /// CLASS: MESSAGE" of a failure.
   std::vector<std::string> Wait(int count = 1) const {
     EXPECT_TRUE(m_state->called.WaitFor(count));
@@ -46,19 +46,19 @@ public:
     return m_state->results;
   }
 
-  /// The token that came last.
+  /// The token that arrived last.
   std::shared_ptr<const SsoClient::SamlToken> GetToken() const {
     const std::lock_guard<std::mutex> lock(m_state->mutex);
     return m_state->token;
   }
 
-  /// The threads that the completions ran on.
+  /// The threads on which the completions ran.
   std::set<std::thread::id> Threads() const {
     const std::lock_guard<std::mutex> lock(m_state->mutex);
     return m_state->threads;
   }
 
-  /// Whether the last completion is gone, and with it the work; waits for that.
+  /// Waits until the last completion is destroyed, and with it the operation's work; false when that takes too long.
   bool IsOver() const {
     return Eventually([this] { return m_state.use_count() == 1; });
   }

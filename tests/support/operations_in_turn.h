@@ -17,11 +17,11 @@
 
 namespace Testing {
 
-/// Runs the five operations that take one message each in turn, and judges what they yield.
+/// Runs the five operations that exchange one message, one after the other, and checks their results.
 class OperationsInTurn {
 public:
-  /// All references outlive this.
-  /// @param subject whose token each operation is to yield; null for none
+  /// All references must outlive this object.
+  /// @param subject the principal of the token that each operation must return; null when there is no token
   /// @param held a token to exchange, validate and renew
   OperationsInTurn(const SsoClient::SecurityTokenService &service, const char *subject,
                    const SsoClient::SamlToken &held)
@@ -29,7 +29,7 @@ public:
     m_spec.tokenLifetimeSec = 60;
   }
 
-  /// Runs that many operations in all, on 16 threads that begin together.
+  /// Runs that many operations in total, on 16 threads that begin together.
   void RunOnSixteenThreads(int count) {
     constexpr int THREADS = 16;
     std::atomic<int> ready{0};
@@ -51,7 +51,7 @@ public:
 
   int CountSuccesses() const { return m_successes; }
 
-  /// What is wrong with the first operation that was not as it must be; empty when all were.
+  /// What was wrong with the first operation that failed; empty when all were right.
   std::string GetFailure() const {
     const std::lock_guard<std::mutex> lock(m_mutex);
     return m_failure;

@@ -1,7 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// Threads that end after OpenSSL has cleaned itself up. What OpenSSL keeps for such a thread, nobody frees any more: it
-/// gives up the key under which a thread would find it when it ends.
+/// Threads that end after OpenSSL has cleaned itself up. The memory that OpenSSL keeps for such a thread is never
+/// freed: OpenSSL has deleted the key by which a thread finds it at its end.
 
 #pragma once
 
@@ -14,7 +14,7 @@
 
 namespace Testing {
 
-/// Called first of all on such a thread: what is allocated there is not reported as a leak.
+/// Must be the first call on such a thread: memory that is allocated there is not reported as a leak.
 inline void BeginOutlivingThread() {
 #ifdef TESTING_FINDS_LEAKS
   __lsan_disable();

@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// `ParsedDocument`, a small document to walk in, and cursors on its elements.
+/// `ParsedDocument`, a small document, and cursors on its elements.
 
 #pragma once
 
@@ -31,7 +31,7 @@ public:
     return *child;
   }
 
-  /// A cursor that stands on the root.
+  /// A cursor on the root.
   SsoClient::NodeFilterIterator Cursor() const { return CursorOn(Root()); }
 
   static SsoClient::NodeFilterIterator CursorOn(const Tarvel::Xml::Node &node) {

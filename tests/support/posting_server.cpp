@@ -21,7 +21,7 @@ std::vector<std::string> PostingServer::GetRequests() const {
 }
 
 void PostingServer::Serve(ServerConnection &peer) {
-  if (m_isSecure && !peer.ShakeHands()) {
+  if (m_isSecure && !peer.Handshake()) {
     return;
   }
   const std::string request = peer.ReadRequest();

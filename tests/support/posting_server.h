@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// `PostingServer`, a token service on loopback that gives one answer after the other, over HTTP or HTTPS.
+/// `PostingServer`, a token service on loopback that sends given answers in order, over HTTP or HTTPS.
 
 #pragma once
 
@@ -22,7 +22,7 @@ public:
 
   std::string GetUrl() const;
 
-  /// What the client has sent so far, header and body.
+  /// The requests that the client has sent so far, header and body.
   std::vector<std::string> GetRequests() const;
 
 private:
@@ -39,7 +39,7 @@ private:
 /// A context that trusts the authority of tests/data/tls.
 Tarvel::Ref<Tarvel::Ssl::SSLContext> ContextThatTrustsTheTestAuthority();
 
-/// How to reach `url`, and to trust what the fixture tokens are signed with.
+/// The configuration for a service at `url` that signs like the fixture tokens.
 SsoClient::SecurityTokenServiceConfig ConfigFor(const std::string &url);
 
 } // namespace Testing

@@ -21,7 +21,7 @@ std::size_t CountDescriptors() {
 }
 
 std::size_t CountThreads() {
-  // ThreadSanitizer's own thread starts with the first one of the process: it must not count as ours.
+  // ThreadSanitizer's own thread starts with the first thread of the process, and must not be counted.
   static const bool started = (std::thread([] {}).join(), true);
   static_cast<void>(started);
   return CountEntries("/proc/self/task");

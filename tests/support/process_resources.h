@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// What the test process holds: open descriptors and threads.
+/// Counts the open descriptors and the threads of the test process.
 
 #pragma once
 
@@ -16,7 +16,7 @@ std::size_t CountDescriptors();
 
 std::size_t CountThreads();
 
-/// Whether `condition` comes true in bounded time. For what ends in the kernel, which notifies nobody.
+/// Whether `condition` becomes true in bounded time. For events in the kernel, of which no notification exists.
 template <typename Condition>
 bool Eventually(const Condition &condition) {
   const auto end = std::chrono::steady_clock::now() + PATIENCE;

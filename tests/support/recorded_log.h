@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// `RecordedLog`, every line that is logged while it lives.
+/// `RecordedLog`, which records every line that is logged while it exists.
 
 #pragma once
 
@@ -15,7 +15,7 @@
 
 namespace Testing {
 
-/// Takes the process's one log sink. Lines have the form "LOGGER LEVEL MESSAGE".
+/// Registers itself as the process's only log sink. Lines have the form "LOGGER LEVEL MESSAGE".
 class RecordedLog {
 public:
   RecordedLog();

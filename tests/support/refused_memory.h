@@ -1,7 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// Memory that a test refuses to C++ code. This header replaces the allocation functions of C++: exactly one source file of a
-/// program includes it, and defines `IsMemoryRefused`.
+/// Lets a test refuse memory to C++ code. This header replaces the allocation functions of C++: exactly one source file
+/// of a program includes it, and defines `IsMemoryRefused`.
 
 #pragma once
 
@@ -12,10 +12,10 @@
 
 namespace Testing {
 
-/// Called for each allocation, on its thread: whether it fails. Must not allocate.
+/// Whether an allocation must fail; called for each one, on its thread. Must not allocate.
 bool IsMemoryRefused() noexcept;
 
-inline std::atomic<long> g_liveAllocations{0}; // that have not been given back
+inline std::atomic<long> g_liveAllocations{0}; // not freed yet
 
 inline void *AllocateUnlessRefused(std::size_t bytes) {
   void *const memory = IsMemoryRefused() ? nullptr : std::malloc(bytes ? bytes : 1);

@@ -8,7 +8,7 @@ namespace Testing {
 
 namespace {
 
-/// Far longer than anything that is waited for here, also under a sanitizer on a machine that is busy.
+/// Far longer than any wait here takes, even under a sanitizer on a busy machine.
 constexpr std::chrono::seconds PATIENCE{120};
 
 } // namespace

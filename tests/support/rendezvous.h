@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// Where threads of a test meet: a count of events, and a gate that holds them up. All waiting is bounded.
+/// Synchronises the threads of a test: a count of events, and a gate that stops threads. All waiting is bounded.
 
 #pragma once
 
@@ -9,12 +9,12 @@
 
 namespace Testing {
 
-/// Counts what happens on any thread.
+/// Counts events on any thread.
 class EventCount {
 public:
   void Add();
 
-  /// Whether there have been that many at least, which is waited for.
+  /// Waits until there have been at least that many; false when that takes too long.
   bool WaitFor(int count) const;
 
   int Get() const;
@@ -25,14 +25,14 @@ private:
   int m_count = 0;
 };
 
-/// Closed at first: who passes waits until it is open.
+/// Closed at first: threads that pass wait until it is open.
 class Gate {
 public:
   void Pass();
 
   void Open();
 
-  /// Whether that many have come to the gate, which is waited for.
+  /// Waits until that many threads have arrived; false when that takes too long.
   bool WaitForArrivals(int count) const { return m_arrived.WaitFor(count); }
 
 private:

@@ -23,7 +23,7 @@ struct SampleRequest {
 
 void PrintTo(const SampleRequest &sample, std::ostream *out);
 
-/// The sample's name in the form that names of test cases have.
+/// The sample's name in the form of test case names.
 std::string TestName(const SampleRequest &sample);
 
 /// The assertion that the samples present, renew and validate: one line of XML, its identifier "_0001".
@@ -31,10 +31,10 @@ std::string SampleTokenXml();
 
 SsoClient::TokenSpec PlainSpec();
 
-/// Everything that a spec can ask for but a delegate.
+/// Everything that a spec can request, except a delegate.
 SsoClient::TokenSpec FullSpec();
 
-/// Texts in every field that takes one but the delegate, none of them ASCII.
+/// A spec with a text that is not ASCII in every text field except the delegate.
 SsoClient::TokenSpec BeyondAsciiSpec();
 
 SsoClient::TokenSpec DelegatedSpec();

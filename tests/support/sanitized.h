@@ -4,7 +4,7 @@
 
 #pragma once
 
-// g++ and clang say so in different words.
+// g++ and clang report it in different ways.
 #if defined(__SANITIZE_ADDRESS__) || defined(__SANITIZE_THREAD__)
 #define TESTING_IS_SANITIZED 1
 #elif defined(__has_feature)

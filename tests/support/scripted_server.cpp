@@ -94,13 +94,13 @@ int BindLoopback(bool v6, int &port) {
   sockaddr_storage address = LoopbackAddress(v6, length);
   Require(::bind(descriptor, reinterpret_cast<const sockaddr *>(&address), length) == 0, "cannot bind");
   Require(::getsockname(descriptor, reinterpret_cast<sockaddr *>(&address), &length) == 0, "no address");
-  sockaddr_in bound{}; // the port stands at the same place in both families
+  sockaddr_in bound{}; // the port is at the same place in both families
   std::memcpy(&bound, &address, sizeof bound);
   port = ntohs(bound.sin_port);
   return descriptor;
 }
 
-/// OpenSSL writes to a socket whose peer is gone without asking for silence.
+/// OpenSSL writes to sockets without MSG_NOSIGNAL, so a write to a closed connection would raise SIGPIPE.
 void BlockBrokenPipeSignal() {
   sigset_t blocked;
   sigemptyset(&blocked);
@@ -136,7 +136,7 @@ ServerConnection::~ServerConnection() {
   SSL_free(m_tls);
 }
 
-bool ServerConnection::ShakeHands() {
+bool ServerConnection::Handshake() {
   if (!m_tls) {
     return true;
   }
@@ -249,7 +249,7 @@ void ServerConnection::Close() {
   CloseWithoutNotice();
 }
 
-// A descriptor that is closed while bytes lie unread sends a reset; so the peer's are read first, as far as they are there.
+// Closing a descriptor with unread bytes sends a reset; so the bytes that have arrived are read first.
 void ServerConnection::CloseWithoutNotice() {
   if (m_descriptor < 0) {
     return;
@@ -333,7 +333,7 @@ ScriptedServer::~ScriptedServer() {
 void ScriptedServer::ChangeTls(const TlsSettings &settings) {
   SSL_CTX *const changed = CreateTls(settings);
   const std::lock_guard<std::mutex> lock(m_mutex);
-  SSL_CTX_free(m_tls); // the connections that have it keep it
+  SSL_CTX_free(m_tls); // connections that use it keep their own references
   m_tls = changed;
 }
 

@@ -1,7 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// A TCP or TLS server on loopback inside the test process, whose every move is scripted. It rests on sockets and OpenSSL
-/// alone, so that it shares nothing with what it tests.
+/// A TCP or TLS server on loopback inside the test process, with a script for every step. It uses only sockets and
+/// OpenSSL, so that it shares no code with the library that it tests.
 
 #pragma once
 
@@ -26,17 +26,17 @@ namespace Testing {
 /// How a server speaks TLS. The certificate is one of tests/data/tls, by name.
 struct TlsSettings {
   std::string certificate = "localhost";
-  int minimumVersion = 0;      ///< as TLS1_2_VERSION; 0 for no limit
-  int maximumVersion = 0;      ///< likewise
-  bool demandsClient = false;  ///< a certificate that chains to "authority" through "intermediate"
+  int minimumVersion = 0;      ///< for example TLS1_2_VERSION; 0 for no limit
+  int maximumVersion = 0;      ///< for example TLS1_2_VERSION; 0 for no limit
+  bool demandsClient = false;  ///< demands a client certificate that chains to "authority" through "intermediate"
   bool allowsWeakness = false; ///< security level 0, without which OpenSSL offers no TLS 1.1
   std::string ciphers;         ///< of TLS 1.2, in OpenSSL's form; empty for OpenSSL's own choice
   bool resumesSessions = true;
   std::size_t tickets = 2; ///< of TLS 1.3, for each full handshake
 };
 
-/// One accepted connection, in the hands of the script, on a thread of its own. Every wait is bounded: a call that gets no
-/// answer in 30 seconds, or in which the server is stopped, ends like one whose peer has gone.
+/// One accepted connection, which the script controls on a separate thread. Every wait is bounded: a call that gets no
+/// answer in 30 seconds, or during which the server is stopped, ends as if the peer had closed the connection.
 class ServerConnection {
 public:
   ServerConnection(int descriptor, ssl_ctx_st *tls);
@@ -44,61 +44,62 @@ public:
   ServerConnection &operator=(const ServerConnection &) = delete;
   ~ServerConnection();
 
-  /// Shakes hands, when the server has TLS; whether that went well. A script calls it first, unless it wants to disturb
+  /// Performs the handshake if the server has TLS; whether it succeeded. A script calls this first, unless it disturbs
   /// the handshake.
-  bool ShakeHands();
+  bool Handshake();
 
-  /// At most `limit` bytes; empty when the peer has ended the connection in whatever way.
+  /// At most `limit` bytes; empty when the peer has ended the connection in any way.
   std::string ReadSome(std::size_t limit = 65536);
-  /// Exactly `length` bytes, or fewer when the peer ends.
+  /// Exactly `length` bytes, or fewer when the peer ends the connection.
   std::string ReadExactly(std::size_t length);
-  /// Up to and with the first `delimiter`, or what there is when the peer ends. Reads on from there next time.
+  /// The bytes up to the first `delimiter`, with it, or all bytes when the peer ends the connection before. The next
+  /// read continues there.
   std::string ReadUntil(std::string_view delimiter);
-  /// One HTTP/1.1 request: its header, and as many bytes more as its Content-Length says.
+  /// One HTTP/1.1 request: its header, and the body that its Content-Length announces.
   std::string ReadRequest();
 
-  /// Whether all bytes were taken.
+  /// Whether all bytes were written.
   bool Write(std::string_view bytes);
 
-  /// Past TLS, if there is any: what stands on the wire.
+  /// Reads the bytes on the wire, without TLS.
   std::string ReadRawSome(std::size_t limit = 65536);
   bool WriteRaw(std::string_view bytes);
 
-  /// Reads, and drops, until the peer ends: a server that never answers.
+  /// Reads and discards until the peer ends the connection: a server that never answers.
   void Stall();
 
-  /// Reads nothing and does nothing until the server is stopped, so that what the peer sends piles up.
+  /// Does nothing until the server is stopped; it does not read either, so that the peer's bytes fill the buffers.
   void WaitForInterrupt();
 
-  /// Ends in order: TLS's closing notice, then TCP's end. What happens without a call when the script returns.
+  /// Ends the connection properly: TLS's closing notice, then TCP's end. Happens by itself when the script returns.
   void Close();
-  /// Ends TCP in order, without TLS's notice.
+  /// Ends TCP properly, without TLS's notice.
   void CloseWithoutNotice();
   /// Ends with a TCP reset.
   void Reset();
 
-  /// Whether the client has sent TLS's closing notice, as far as has been read.
+  /// Whether the bytes read so far include TLS's closing notice from the client.
   bool ReceivedClosingNotice() const;
   bool WasResumed() const;
-  /// What the client sent in its server name extension; empty for none.
+  /// The name in the client's server name extension; empty for none.
   std::string GetServerName() const;
   /// The common name of the client's certificate; empty for none.
   std::string GetClientName() const;
 
-  /// Wakes whatever waits in a call, from another thread.
+  /// Ends a call that waits on another thread.
   void Interrupt() noexcept;
 
 private:
   std::ptrdiff_t Receive(char *buffer, std::size_t length);
   void EndDescriptor() noexcept;
 
-  std::mutex m_mutex; // guards the descriptor's end
+  std::mutex m_mutex; // guards the closing of the descriptor
   std::condition_variable m_interrupted;
   bool m_isInterrupted = false;
   int m_descriptor; // -1 when closed
   ssl_st *m_tls;    // null for none
   bool m_established = false;
-  std::string m_ahead; // read, but not asked for yet
+  std::string m_ahead; // read, but not returned yet
 };
 
 class ScriptedServer {
@@ -113,13 +114,13 @@ public:
   /// Ends all connections and waits for their scripts.
   ~ScriptedServer();
 
-  /// What connections that are accepted from now on meet.
+  /// Changes the settings for connections that are accepted from now on.
   void ChangeTls(const TlsSettings &settings);
 
   int GetPort() const noexcept { return m_port; }
   /// How many connections have been accepted so far.
   int GetConnectionCount() const noexcept { return m_accepted; }
-  /// How many connections' scripts have not ended.
+  /// How many connections have a script that has not ended.
   std::size_t GetOpenCount() const;
 
 private:
@@ -144,7 +145,7 @@ private:
   std::thread m_acceptor;
 };
 
-/// A port of 127.0.0.1 on which nobody listens: connecting is refused as long as this lives.
+/// A port of 127.0.0.1 on which no process listens: connecting is refused as long as this object exists.
 class UnusedPort {
 public:
   UnusedPort();
@@ -155,10 +156,10 @@ public:
 
 private:
   int m_port = 0;        // before the descriptor, which sets it
-  int m_descriptor = -1; // bound, and so nobody else's, but not listening
+  int m_descriptor = -1; // bound, so that no other process can use the port, but not listening
 };
 
-/// A port of 127.0.0.1 that takes no more connections: its queue is full, and nobody empties it. A connect gets no answer.
+/// A port of 127.0.0.1 that accepts no more connections: its queue stays full. A connect gets no answer.
 class FullPort {
 public:
   FullPort();
@@ -167,7 +168,7 @@ public:
   ~FullPort();
   int GetPort() const noexcept { return m_port; }
 
-  /// Makes room in the queue. Whoever asks from now on gets an answer from `AnswerAll`.
+  /// Empties the queue. Later connections get an answer from `AnswerAll`.
   void Empty();
   /// Answers each connection that sends a request, until `StopAnswering` is called on another thread.
   void AnswerAll(std::string_view bytes);

@@ -1,9 +1,10 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// Stand-ins for what the service works with. They hold no state but what the test looks at, and are safe on any thread.
+/// Stand-ins for the collaborators of the service. Their only state is what the test reads, and they are safe on any
+/// thread.
 ///
 /// The request builder writes its call and the arguments into the request. The transport records requests, and answers
-/// with the text that the test's function gives. The response handler reads texts of its own simple form:
+/// with the text that the test's function returns. The response handler reads texts of a simple form:
 /// "issued:XML", "renewed:XML", "valid:true", "valid:false", "leg:CONTEXT|BYTES|XML"; "fault:MESSAGE" is refused.
 
 #pragma once
@@ -30,7 +31,7 @@ std::string ToString(const Bytes &bytes);
 
 class RequestBuilderStandIn final : public SsoClient::RequestBuilder {
 public:
-  /// @param onCall called at the beginning of each call; what it throws is the builder's refusal
+  /// @param onCall called at the beginning of each call; if it throws, the builder refuses with that exception
   explicit RequestBuilderStandIn(std::function<void()> onCall = [] {});
 
   void BuildUserPassTokenRequest(const std::string &username, const std::string &password,
@@ -52,7 +53,7 @@ private:
   const std::function<void()> m_onCall;
 };
 
-/// What the service answers to a request. What it throws is the transport's failure.
+/// Returns the service's answer to a request. An exception is a failure of the transport.
 using Answer = std::function<std::string(const SsoClient::Request &)>;
 
 class TransportStandIn final : public SsoClient::Transport {
@@ -61,7 +62,7 @@ public:
 
   std::shared_ptr<SsoClient::TransportSession> CreateSession() const override;
 
-  /// The bodies of the requests, each behind the number of its session: "1: UserPass …".
+  /// The bodies of the requests, each after the number of its session: "1: UserPass …".
   std::vector<std::string> Sent() const;
 
   int CountSessions() const;
@@ -92,7 +93,7 @@ private:
   const std::function<void()> m_onCall;
 };
 
-/// A handler that answers with the legs of its script, null included, and records what the service sent.
+/// A handler that answers with the legs of its script, which may be null, and records the legs of the service.
 class NegotiationHandlerStandIn final : public SsoClient::NegotiationHandler {
 public:
   explicit NegotiationHandlerStandIn(std::vector<std::shared_ptr<Bytes>> script);
@@ -107,7 +108,7 @@ private:
 
 std::shared_ptr<Bytes> Leg(const std::string &text);
 
-/// The certificate that the fixture tokens are signed with.
+/// The certificate of the key that signed the fixture tokens.
 Tarvel::Crypto::CertificateList TrustedCertificates();
 
 std::shared_ptr<SsoClient::SecurityTokenServiceImpl> ServiceOn(

@@ -8,7 +8,7 @@
 
 namespace Testing {
 
-/// The text of a token file, fit to be put into another document.
+/// The text of a token file, without its XML declaration, so that it can be part of another document.
 inline std::string WithoutXmlDeclaration(const std::string &xml) {
   const std::size_t end = xml.rfind("<?xml", 0) == 0 ? xml.find("?>") + 2 : 0;
   return xml.substr(xml.find('<', end));
@@ -32,7 +32,7 @@ inline std::string Collection(const std::string &content) {
   return "<wst:RequestSecurityTokenResponseCollection>" + content + "</wst:RequestSecurityTokenResponseCollection>";
 }
 
-/// @param attributes as in " Context='c'"
+/// @param attributes for example " Context='c'"
 inline std::string ResponseElement(const std::string &content, const std::string &attributes = "") {
   return "<wst:RequestSecurityTokenResponse" + attributes + ">" + content + "</wst:RequestSecurityTokenResponse>";
 }
@@ -49,7 +49,7 @@ inline std::string ValidateResponse(const std::string &code) {
   return Envelope(ResponseElement("<wst:Status><wst:Code>" + code + "</wst:Code></wst:Status>"));
 }
 
-/// @param code as it stands in the fault, prefix included
+/// @param code as it is written in the fault, with its prefix
 inline std::string FaultResponse(const std::string &code, const std::string &text) {
   return Envelope("<soapenv:Fault><faultcode>" + code + "</faultcode><faultstring>" + text +
                   "</faultstring></soapenv:Fault>");

@@ -19,7 +19,7 @@ namespace Testing {
     }
     return ::testing::AssertionSuccess();
   } catch (...) {
-    return ::testing::AssertionFailure() << "something was thrown that is no std::exception";
+    return ::testing::AssertionFailure() << "something was thrown that is not a std::exception";
   }
 }
 

@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// The one matcher for exceptions: the exact dynamic class and the whole message.
+/// The only matcher for exceptions: it checks the exact dynamic class and the whole message.
 
 #pragma once
 
@@ -11,13 +11,13 @@
 
 namespace Testing {
 
-/// Judges the exception that is being handled.
+/// Compares the exception that is being handled.
 ::testing::AssertionResult JudgeThrown(const std::type_info &expected, const std::string &message);
 
 ::testing::AssertionResult FailureOfNothingThrown(const std::type_info &expected, const std::string &message);
 
-/// Runs `statement` and judges what it throws: an exception of exactly the class `Expected` with exactly that message.
-/// Each use is an instance of its own, so what needs no template is elsewhere.
+/// Runs `statement` and checks that it throws an exception of exactly the class `Expected` with exactly that message.
+/// Each use is a separate instantiation, so the code that needs no template is in functions.
 template <typename Expected, typename Statement>
 ::testing::AssertionResult ThrowsMessage(const Statement &statement, const std::string &message) {
   try {

@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// The place of a virtual function in its class's table: what a program that was built with an older header relies on.
+/// The place of a virtual function in its class's table: programs that were built with an older header rely on it.
 
 #pragma once
 
@@ -10,7 +10,7 @@
 
 namespace Testing {
 
-/// The place of `function`, from 1 on, by the Itanium C++ ABI, which g++ and clang follow; 0 for a function that is not
+/// The place of `function`, counted from 1, in the Itanium C++ ABI of g++ and clang; 0 for a function that is not
 /// virtual.
 template <typename Function>
 std::ptrdiff_t SlotOf(Function function) {

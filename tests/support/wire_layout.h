@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// The readable form in which golden files hold a message that is one line on the wire.
+/// The readable form of a message in golden files; the message itself is one line.
 
 #pragma once
 
@@ -9,7 +9,7 @@
 
 namespace Testing {
 
-/// Where the tag that begins at `start` ends: behind its ">". Attribute values may hold a ">".
+/// The position after the ">" of the tag that begins at `start`. Attribute values may contain a ">".
 inline std::size_t EndOfTag(const std::string &xml, std::size_t start) {
   char quote = '\0';
   for (std::size_t i = start; i < xml.size(); ++i) {
@@ -24,7 +24,7 @@ inline std::size_t EndOfTag(const std::string &xml, std::size_t start) {
   return xml.size();
 }
 
-/// `wire` with one element a line, indented by depth; an element with nothing but text, and an empty one, take one line.
+/// `wire` with one element on each line, indented by depth; an element with only text, and an empty one, take one line.
 inline std::string ToReadable(const std::string &wire) {
   std::string readable;
   std::size_t depth = 0;
@@ -51,7 +51,7 @@ inline std::string ToReadable(const std::string &wire) {
   return readable + "\n";
 }
 
-/// What `ToReadable` was made from: without the line ends and the indentation behind them.
+/// The reverse of `ToReadable`: removes the line ends and the indentation after them.
 inline std::string ToWire(const std::string &readable) {
   std::string wire;
   bool atLineStart = true;

@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// A folder of a test's own.
+/// A temporary folder for one test.
 
 #pragma once
 
@@ -9,7 +9,7 @@
 
 namespace Testing {
 
-/// A new, empty folder that goes with all that is in it at the end.
+/// A new, empty folder, which is removed at the end with everything in it.
 class WorkFolder {
 public:
   WorkFolder();
@@ -20,7 +20,7 @@ public:
   const std::string &Path() const { return m_path; }
   std::string operator/(const std::string &name) const { return m_path + "/" + name; }
 
-  /// Writes a file; its path.
+  /// Writes a file and returns its path.
   std::string Write(const std::string &name, const std::string &content) const;
 
   std::string Read(const std::string &name) const;

@@ -27,7 +27,8 @@ inline std::string WriteElement(const Tarvel::Xml::ElementNode &element) {
   return writer->GetText();
 }
 
-/// "(" opens an element, ")" closes it; each name and value follows its length, so that none can pass for another.
+/// "(" opens an element, ")" closes it; each name and value follows its length, so that none can be confused with
+/// another.
 inline std::string DescribeTree(const Tarvel::Xml::Node &top) {
   using namespace Tarvel::Xml;
   const auto quote = [](std::string_view text) { return std::to_string(text.size()) + ":" + std::string(text); };

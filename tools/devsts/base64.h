@@ -10,10 +10,10 @@
 
 namespace DevSts {
 
-/// The octets, white space allowed in the text; empty when it is none, or longer than 64 KiB.
+/// The octets; white space is allowed in the text. Empty when the text is not Base64, or longer than 64 KiB.
 std::vector<unsigned char> DecodeBase64(std::string_view text);
 
-/// In one line.
+/// Base64 without line breaks.
 std::string EncodeBase64(const std::vector<unsigned char> &bytes);
 
 } // namespace DevSts

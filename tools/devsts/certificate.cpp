@@ -36,7 +36,7 @@ std::vector<unsigned char> DerOf(const X509 &certificate) {
   return copy;
 }
 
-/// The only entry of that kind in the name; empty for none or several.
+/// The entry of that kind in the name; empty unless there is exactly one.
 std::string OnlyEntry(const X509_NAME *name, int kind) {
   const int at = X509_NAME_get_index_by_NID(name, kind, -1);
   if (at < 0 || X509_NAME_get_index_by_NID(name, kind, at) >= 0) {
@@ -82,7 +82,8 @@ bool HasStrongKey(const X509 &certificate) {
 }
 
 bool IsClientOf(X509 &certificate, X509 &authority) {
-  // Without the extension OpenSSL takes a certificate for any purpose, and so the token signer's for a client's.
+  // Without the extension OpenSSL accepts a certificate for any purpose, so the token signer's would pass as a
+  // client's.
   if ((X509_get_extension_flags(&certificate) & EXFLAG_XKUSAGE) == 0) {
     return false;
   }

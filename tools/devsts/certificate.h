@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// X.509 certificates and their keys, as OpenSSL holds them.
+/// X.509 certificates and their keys, in OpenSSL's types.
 
 #pragma once
 
@@ -22,10 +22,10 @@ struct KeyDeleter {
 using Certificate = std::unique_ptr<X509, X509Deleter>;
 using PrivateKey = std::unique_ptr<EVP_PKEY, KeyDeleter>;
 
-/// The certificate in Base64 DER text, white space allowed; null when it is none.
+/// Decodes a certificate from Base64 of its DER form; white space is allowed. Null when the text is not a certificate.
 Certificate DecodeCertificate(std::string_view base64);
 
-/// Base64 of the DER form, in one line.
+/// Base64 of the DER form, without line breaks.
 std::string EncodeCertificate(const X509 &certificate);
 
 /// The SHA-256 digest of the DER form, as 64 lower-case hexadecimal digits.
@@ -34,13 +34,13 @@ std::string ThumbprintOf(const X509 &certificate);
 /// Whether the key is RSA of at least 2048 bits.
 bool HasStrongKey(const X509 &certificate);
 
-/// Whether `authority` issued the certificate, for clients by its extended key usage, and its dates hold now.
+/// Whether `authority` issued the certificate, its extended key usage is for clients, and its dates are valid now.
 bool IsClientOf(X509 &certificate, X509 &authority);
 
 /// "CN@O" of the subject; empty unless it has exactly one of each.
 std::string PrincipalOf(const X509 &certificate);
 
-/// What OpenSSL has to say about its last failures; clears them.
+/// The texts of OpenSSL's error queue, which is then empty.
 std::string OpenSslErrors();
 
 } // namespace DevSts

@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// The encoding that messages have on the wire.
+/// The character encoding of messages on the wire.
 
 #pragma once
 
@@ -11,17 +11,18 @@
 
 namespace DevSts {
 
-/// Inside the service every text is UTF-8. Any number of threads may use it at once.
+/// Converts between the encoding on the wire and UTF-8, which every text inside the service has. Any number of threads
+/// may use it at once.
 class Charset {
 public:
-  /// @param name one that libxml2 can encode and decode, in any letter case; the answers name it so
+  /// @param name one that libxml2 can encode and decode, in any letter case; the answers repeat it in that letter case
   explicit Charset(std::string name) : m_name(std::move(name)) {}
 
-  /// A received message as UTF-8; nothing when it is not in this charset. An XML declaration in it is left as it is.
+  /// A received message as UTF-8; none when it is not in this charset. An XML declaration in it is not changed.
   std::optional<std::string> Decode(std::string_view message) const;
 
-  /// An answer as it is sent. What the charset does not have is written as a character reference. In any charset but
-  /// UTF-8, an XML declaration comes first.
+  /// An answer in this charset. A character that the charset does not have becomes a character reference. In any
+  /// charset but UTF-8, the answer begins with an XML declaration.
   std::string Encode(const std::string &answer) const;
 
   /// The answers' media type.

@@ -35,7 +35,7 @@ namespace beast = boost::beast;
 namespace http = boost::beast::http;
 
 constexpr std::chrono::seconds HANDSHAKE_LIMIT(30);
-constexpr std::chrono::seconds REQUEST_LIMIT(60); // an idle connection is closed after it as well
+constexpr std::chrono::seconds REQUEST_LIMIT(60); // also closes an idle connection
 constexpr std::chrono::seconds WRITE_LIMIT(60);
 constexpr std::chrono::seconds CLOSE_LIMIT(5);
 constexpr std::uint32_t HEADER_BYTES = 16 * 1024;
@@ -53,7 +53,7 @@ std::string Field(const http::request<http::string_body> &message, std::string_v
   return std::string(message[boost::string_view(name.data(), name.size())]);
 }
 
-/// Lives as long as an operation of it is under way. Everything runs on the strand of its socket.
+/// Lives as long as one of its operations is under way. Everything runs on the strand of its socket.
 class Connection : public std::enable_shared_from_this<Connection> {
 public:
   /// All references outlive the connection. `count` is one higher while it lives.
@@ -137,7 +137,7 @@ void Connection::OnRead(const ErrorCode &error) {
   Begin(m_handler.Handle(TakeRequest()));
 }
 
-/// A request that breaks HTTP or a limit gets an answer; a connection that breaks gets none.
+/// Answers a request that violates HTTP or exceeds a limit. A broken connection gets no answer.
 void Connection::RefuseUnreadable(const ErrorCode &error) {
   if (error.category() != http::make_error_code(http::error::bad_value).category() ||
       error == http::error::partial_message) {
@@ -219,8 +219,8 @@ void Connection::Close() {
   m_stream.async_shutdown([self = shared_from_this()](const ErrorCode &) { self->Linger(); });
 }
 
-/// A socket that is closed with bytes unread sends a reset, which destroys the answer on its way to a client that is still
-/// sending. So what comes is read, until the client closes too or the limit is reached.
+/// A socket that is closed while bytes are unread sends a reset, which destroys the answer on its way to a client that
+/// is still sending. So this reads on until the client closes the connection or the time limit is reached.
 void Connection::Linger() {
   ErrorCode ignored;
   m_stream.next_layer().socket().shutdown(asio::ip::tcp::socket::shutdown_send, ignored);
@@ -240,7 +240,7 @@ void Connection::Reset() {
   socket.close(ignored);
 }
 
-/// Never answers; ends when the client gives up.
+/// Never answers; ends when the client closes the connection.
 void Connection::AwaitPeer() {
   m_stream.next_layer().expires_never();
   m_buffer.clear();

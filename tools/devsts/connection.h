@@ -13,9 +13,9 @@ namespace DevSts {
 
 class RequestHandler;
 
-/// Starts the handshake on `socket`, then serves what the client asks. The connection lives as long as an operation of it
-/// is under way. Everything runs on the strand of its socket. All references outlive the connection. `count` is one higher
-/// while it lives.
+/// Starts the handshake on `socket`, then serves the client's requests. The connection lives as long as one of its
+/// operations is under way. Everything runs on the strand of its socket. All references outlive the connection. `count`
+/// is one higher while it lives.
 void StartConnection(boost::asio::ip::tcp::socket socket, boost::asio::ssl::context &tls, const RequestHandler &handler,
                      std::atomic<int> &count);
 

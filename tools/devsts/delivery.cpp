@@ -8,7 +8,7 @@ namespace DevSts {
 
 namespace {
 
-// One more than the 16 MiB that a client may be expected to take.
+// One more than the 16 MiB that a client can be expected to accept.
 constexpr std::size_t OVERSIZE_BYTES = 16U * 1024 * 1024 + 1;
 constexpr std::size_t DRIP_PIECES = 40;
 
@@ -104,7 +104,7 @@ Delivery Deliver(const HttpAnswer &answer, const Fault &fault, bool keepOpen) {
   case DeliveryFault::BAD_CONTENT_LENGTH:
     return Single(Head(answer, "many", false) + answer.body, DeliveryEnd::CLOSE);
   case DeliveryFault::GARBAGE:
-    return Single("\x01\x02 this is no HTTP\r\n\r\n", DeliveryEnd::CLOSE);
+    return Single("\x01\x02 this is not HTTP\r\n\r\n", DeliveryEnd::CLOSE);
   case DeliveryFault::NONE:
     break;
   }

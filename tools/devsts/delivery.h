@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// How an HTTP answer goes onto the wire: in which pieces, when, and what becomes of the connection.
+/// How an HTTP answer is sent: in which pieces, when, and what happens to the connection afterwards.
 
 #pragma once
 
@@ -30,10 +30,10 @@ struct HttpAnswer {
   std::string body;
 };
 
-/// The answer, sent as the fault wants it. A connection that the client does not keep open is closed behind it.
+/// How to send the answer with the fault. A connection that the client does not keep open is closed afterwards.
 Delivery Deliver(const HttpAnswer &answer, const Fault &fault, bool keepOpen);
 
-/// Whether the fault needs no answer, so that the request need not be looked at.
+/// Whether the fault sends nothing of the answer, so that the request need not be processed.
 bool IgnoresRequest(DeliveryFault fault);
 
 } // namespace DevSts

@@ -135,14 +135,14 @@ std::optional<Fault> ParseNumberedFault(std::string_view name) {
   return std::nullopt;
 }
 
-/// The first element of that local name at or below `root`.
+/// The first element with that local name at or below `root`.
 xmlNode *FindBelow(xmlNode *root, const char *name) {
   if (!root || xmlStrEqual(root->name, XmlText(name))) {
     return root;
   }
   for (xmlNode *child : ChildElements(*root)) {
     if (xmlStrEqual(child->name, XmlText("Assertion"))) {
-      continue; // what is to be spoilt stands around the token, not in it
+      continue; // these faults change the response around the token, not the token
     }
     if (xmlNode *found = FindBelow(child, name)) {
       return found;
@@ -170,8 +170,8 @@ void Remove(xmlNode *element) {
   }
 }
 
-/// What is wrong with a leg of a negotiation. A response without one stays as it is.
-void SpoilLeg(xmlNode *root, DocumentFault fault) {
+/// Corrupts the leg of a negotiation. A response without a leg stays as it is.
+void CorruptLeg(xmlNode *root, DocumentFault fault) {
   xmlNode *const response = FindBelow(root, "RequestSecurityTokenResponse");
   xmlNode *const exchange = FindBelow(root, "BinaryExchange");
   if (!response || !exchange) {
@@ -193,7 +193,7 @@ void SpoilLeg(xmlNode *root, DocumentFault fault) {
   }
 }
 
-/// A response in a collection loses it, any other gets one.
+/// Removes the collection around a response, or adds one when there is none.
 void SwapWrapper(xmlNode &body) {
   xmlNode &content = *ChildElements(body).front();
   if (IsElement(content, Ns::WST, "RequestSecurityTokenResponseCollection")) {
@@ -209,7 +209,7 @@ void SwapWrapper(xmlNode &body) {
   xmlAddChild(&collection, &content);
 }
 
-/// An element in an element in an element and so on.
+/// Adds many nested elements.
 void Deepen(xmlNode &body) {
   xmlNode *innermost = &body;
   for (int level = 0; level < DEEP_LEVELS; ++level) {
@@ -217,13 +217,50 @@ void Deepen(xmlNode &body) {
   }
 }
 
-/// What stands in the body becomes the document.
+/// Makes the content of the body the whole document.
 void RemoveEnvelope(xmlDoc &response, xmlNode &body) {
   xmlNode *const content = ChildElements(body).front();
   xmlUnlinkNode(content);
   xmlNode *const envelope = xmlDocSetRootElement(&response, content);
   xmlReconciliateNs(&response, content);
   xmlFreeNode(envelope);
+}
+
+/// Applies the faults that change the tree of the response.
+void CorruptTree(xmlDoc &response, DocumentFault fault) {
+  xmlNode *const root = xmlDocGetRootElement(&response);
+  switch (fault) {
+  case DocumentFault::NO_TOKEN:
+    Empty(FindBelow(root, "RequestedSecurityToken"));
+    Empty(FindBelow(root, "Status"));
+    return;
+  case DocumentFault::WRONG_ELEMENT:
+    Rename(FindBelow(root, "RequestedSecurityToken"), "RequestedProofToken");
+    Rename(FindBelow(root, "Status"), "State");
+    return;
+  case DocumentFault::WRONG_ROOT:
+    RemoveEnvelope(response, RequireChild(*root, Ns::SOAPENV, "Body"));
+    return;
+  case DocumentFault::WRONG_WRAPPER:
+    SwapWrapper(RequireChild(*root, Ns::SOAPENV, "Body"));
+    return;
+  case DocumentFault::WRONG_STATUS:
+    if (xmlNode *code = FindBelow(root, "Code")) {
+      SetText(*code, std::string(Ns::WST.uri) + "/status/unknown");
+    }
+    return;
+  case DocumentFault::NO_LEG:
+  case DocumentFault::GARBAGE_LEG:
+  case DocumentFault::NO_CONTEXT:
+  case DocumentFault::OTHER_CONTEXT:
+    CorruptLeg(root, fault);
+    return;
+  case DocumentFault::TOO_DEEP:
+    Deepen(RequireChild(*root, Ns::SOAPENV, "Body"));
+    return;
+  default:
+    return;
+  }
 }
 
 } // namespace
@@ -268,7 +305,7 @@ std::string FaultHelp() {
   return help + line + "\n";
 }
 
-void SpoilFacts(TokenFacts &facts, TokenFault fault) {
+void CorruptFacts(TokenFacts &facts, TokenFault fault) {
   const auto life = facts.notOnOrAfter - facts.notBefore;
   constexpr std::chrono::hours DAY(24);
   switch (fault) {
@@ -286,7 +323,7 @@ void SpoilFacts(TokenFacts &facts, TokenFault fault) {
   case TokenFault::BEARER:
     facts.certificate.clear();
     return;
-  case TokenFault::PLAIN: // whatever was asked for
+  case TokenFault::PLAIN: // without anything that was asked for
     facts.delegation.clear();
     facts.audience.clear();
     facts.advice.clear();
@@ -301,7 +338,7 @@ void SpoilFacts(TokenFacts &facts, TokenFault fault) {
   }
 }
 
-void SpoilToken(xmlDoc &token, TokenFault fault) {
+void CorruptToken(xmlDoc &token, TokenFault fault) {
   xmlNode &assertion = *xmlDocGetRootElement(&token);
   switch (fault) {
   case TokenFault::NO_SUBJECT: {
@@ -326,51 +363,21 @@ void TamperWith(xmlDoc &token) {
   SetText(RequireChild(subject, Ns::SAML, "NameID"), "mallory@corp.example");
 }
 
-std::string SpoilResponse(xmlDoc &response, DocumentFault fault) {
-  xmlNode *const root = xmlDocGetRootElement(&response);
+std::string CorruptResponse(xmlDoc &response, DocumentFault fault) {
+  CorruptTree(response, fault);
+  std::string text = Serialise(response);
   switch (fault) {
-  case DocumentFault::NO_TOKEN:
-    Empty(FindBelow(root, "RequestedSecurityToken"));
-    Empty(FindBelow(root, "Status"));
-    break;
-  case DocumentFault::WRONG_ELEMENT:
-    Rename(FindBelow(root, "RequestedSecurityToken"), "RequestedProofToken");
-    Rename(FindBelow(root, "Status"), "State");
-    break;
-  case DocumentFault::WRONG_ROOT:
-    RemoveEnvelope(response, RequireChild(*root, Ns::SOAPENV, "Body"));
-    break;
-  case DocumentFault::WRONG_WRAPPER:
-    SwapWrapper(RequireChild(*root, Ns::SOAPENV, "Body"));
-    break;
-  case DocumentFault::WRONG_STATUS:
-    if (xmlNode *code = FindBelow(root, "Code")) {
-      SetText(*code, std::string(Ns::WST.uri) + "/status/unknown");
-    }
-    break;
-  case DocumentFault::NO_LEG:
-  case DocumentFault::GARBAGE_LEG:
-  case DocumentFault::NO_CONTEXT:
-  case DocumentFault::OTHER_CONTEXT:
-    SpoilLeg(root, fault);
-    break;
-  case DocumentFault::GARBLED_XML: {
-    const std::string text = Serialise(response);
+  case DocumentFault::GARBLED_XML:
     return text.substr(0, text.rfind("</")) + "</garbled>";
-  }
   case DocumentFault::NOT_SOAP:
     return "<html><head><title>Welcome</title></head><body>It works!</body></html>";
   case DocumentFault::EMPTY_BODY:
     return {};
   case DocumentFault::DOCTYPE:
-    return "<!DOCTYPE Envelope>" + Serialise(response);
-  case DocumentFault::TOO_DEEP:
-    Deepen(RequireChild(*root, Ns::SOAPENV, "Body"));
-    break;
+    return "<!DOCTYPE Envelope>" + text;
   default:
-    break;
+    return text;
   }
-  return Serialise(response);
 }
 
 } // namespace DevSts

@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// The ways in which the service misbehaves when it is asked to.
+/// The ways in which the service misbehaves on request.
 
 #pragma once
 
@@ -31,7 +31,7 @@ enum class TokenFault {
   SHORT_LIVED,
 };
 
-/// What is wrong with the document that is answered.
+/// What is wrong with the document of the answer.
 enum class DocumentFault {
   NONE,
   NO_TOKEN,
@@ -69,7 +69,7 @@ enum class DeliveryFault {
   GARBAGE,
 };
 
-/// One of them at most is not NONE.
+/// At most one of the three is not NONE.
 struct Fault {
   TokenFault token = TokenFault::NONE;
   DocumentFault document = DocumentFault::NONE;
@@ -78,22 +78,22 @@ struct Fault {
   FaultCode code{{}, ""}; ///< of SOAP_FAULT
 };
 
-/// Nothing for a name that is none.
+/// Returns none for an unknown name.
 std::optional<Fault> ParseFault(std::string_view name);
 
 /// All names, for the help text: wrapped lines, each indented.
 std::string FaultHelp();
 
-/// Makes the facts wrong as the fault wants it, before the token is built.
-void SpoilFacts(TokenFacts &facts, TokenFault fault);
+/// Applies the fault to the facts, before the token is built.
+void CorruptFacts(TokenFacts &facts, TokenFault fault);
 
-/// Makes the token wrong as the fault wants it, before it is signed.
-void SpoilToken(xmlDoc &token, TokenFault fault);
+/// Applies the fault to the token, before it is signed.
+void CorruptToken(xmlDoc &token, TokenFault fault);
 
-/// Changes the subject of a token that is signed already.
+/// Changes the subject of a token that is already signed.
 void TamperWith(xmlDoc &token);
 
-/// The text of a response once the fault has been at it.
-std::string SpoilResponse(xmlDoc &response, DocumentFault fault);
+/// Applies the fault to a response. Returns the text to send.
+std::string CorruptResponse(xmlDoc &response, DocumentFault fault);
 
 } // namespace DevSts

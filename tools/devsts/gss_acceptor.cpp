@@ -16,7 +16,7 @@ namespace DevSts {
 
 namespace {
 
-/// A status has a handful of texts.
+/// A status has only a few texts.
 constexpr int MAX_TEXTS = 16;
 
 gss_OID Spnego() noexcept {
@@ -73,7 +73,7 @@ std::string Describe(OM_uint32 major, OM_uint32 minor) {
   return TextsOf(major, GSS_C_GSS_CODE) + (minor == 0 ? "" : ": " + words);
 }
 
-/// Shared by all negotiations that it was used for.
+/// Shared by all negotiations.
 class Credential {
 public:
   Credential(const std::filesystem::path &keytab, const std::filesystem::path &replays) {
@@ -83,7 +83,7 @@ public:
         {{"keytab", keytabName.c_str()}, {"rcache", replayCache.c_str()}}};
     const gss_key_value_set_desc store = {elements.size(), elements.data()};
     gss_OID_set_desc mechanisms = {1, Kerberos()};
-    // Kerberos alone first: SPNEGO does not say why a keytab is of no use.
+    // For Kerberos first, since SPNEGO does not say why a keytab cannot be used.
     Acquire(store, mechanisms);
     Release();
     mechanisms.elements = Spnego();
@@ -124,7 +124,7 @@ public:
   }
 
   AcceptedLeg Accept(const std::vector<unsigned char> &leg) override {
-    std::vector<unsigned char> input = leg; // the GSSAPI's declarations know no const
+    std::vector<unsigned char> input = leg; // a copy, because the GSSAPI's declarations do not use const
     gss_buffer_desc buffer = {input.size(), input.data()};
     Octets answer;
     OM_uint32 minor = 0;

@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// The service's part of a SPNEGO negotiation, by the system's GSSAPI.
+/// The service's side of a SPNEGO negotiation, by the system's GSSAPI.
 
 #pragma once
 
@@ -12,13 +12,13 @@
 
 namespace DevSts {
 
-/// What comes of one leg of the client.
+/// The result of a leg of the client.
 struct AcceptedLeg {
   std::vector<unsigned char> answer;
-  std::optional<std::string> client; ///< as "alice@CORP.EXAMPLE", once the negotiation is complete
+  std::optional<std::string> client; ///< such as "alice@CORP.EXAMPLE", once the negotiation is complete
 };
 
-/// The service's part of one negotiation. For one thread at a time.
+/// The service's side of one negotiation. For one thread at a time.
 class Acceptance {
 public:
   Acceptance() = default;
@@ -26,7 +26,7 @@ public:
   Acceptance &operator=(const Acceptance &) = delete;
   virtual ~Acceptance() = default;
 
-  /// @throws Refusal (wst:FailedAuthentication) with the GSSAPI's words
+  /// @throws Refusal (wst:FailedAuthentication) with the GSSAPI's texts
   virtual AcceptedLeg Accept(const std::vector<unsigned char> &leg) = 0;
 };
 
@@ -41,9 +41,9 @@ public:
   virtual std::unique_ptr<Acceptance> Begin() const = 0;
 };
 
-/// Takes tickets for every service whose key is in the keytab. `replays` is a file that the GSSAPI notes in which tickets it
-/// has seen.
-/// @throws std::runtime_error when the keytab cannot be used, or this program was built without the GSSAPI
+/// Accepts tickets for every service whose key is in the keytab. `replays` is a file in which the GSSAPI records the
+/// tickets that it has seen.
+/// @throws std::runtime_error when the keytab cannot be used, or when this program was built without the GSSAPI
 std::unique_ptr<const GssAcceptor> CreateGssAcceptor(const std::filesystem::path &keytab,
                                                      const std::filesystem::path &replays);
 

@@ -101,7 +101,7 @@ HttpsListener::Server::~Server() {
 }
 
 void HttpsListener::Server::Listen(std::uint16_t port) {
-  // A port that is free on one address may be taken on the other; when any will do, another is tried.
+  // A free port of one address may be in use on the other. When the caller does not choose the port, another is tried.
   for (int left = port == 0 ? PORT_TRIES : 1;; --left) {
     m_acceptors.clear();
     m_acceptors.push_back(OpenAcceptor(m_context, asio::ip::address_v4::loopback(), port));
@@ -111,7 +111,7 @@ void HttpsListener::Server::Listen(std::uint16_t port) {
       return;
     } catch (const boost::system::system_error &failure) {
       if (LacksIpV6(failure)) {
-        LogLine("listening on 127.0.0.1 alone: this machine has no ::1");
+        LogLine("listening only on 127.0.0.1: this machine has no ::1");
         return;
       }
       if (!IsPortTaken(failure) || left <= 1) {
@@ -137,7 +137,7 @@ void HttpsListener::Server::Accept(tcp::acceptor &acceptor) {
       StartConnection(std::move(socket), m_tls, m_handler, m_connections);
     }
     if (error) {
-      LogLine("cannot take a connection: " + error.message());
+      LogLine("cannot accept a connection: " + error.message());
       std::this_thread::sleep_for(PAUSE_WITHOUT_DESCRIPTORS);
     }
     Accept(acceptor);

@@ -14,21 +14,21 @@ class RequestHandler;
 
 class HttpsListener {
 public:
-  /// Listens on 127.0.0.1 and, where the machine has it, on ::1; port 0 takes a free one, the same for both.
-  /// `handler` outlives the listener. @throws std::exception when that is not possible
+  /// Listens on 127.0.0.1 and, where the machine has it, on ::1. Port 0 chooses a free port, the same for both
+  /// addresses. `handler` outlives the listener. @throws std::exception when that is not possible
   HttpsListener(const Identity &identity, std::uint16_t port, const RequestHandler &handler);
   HttpsListener(const HttpsListener &) = delete;
   HttpsListener &operator=(const HttpsListener &) = delete;
-  /// Ends all connections at once.
+  /// Closes all connections at once.
   ~HttpsListener();
 
   std::uint16_t GetPort() const noexcept;
 
-  /// Starts to take connections, on threads of its own.
+  /// Starts to accept connections, on its own threads.
   void Start();
 
 private:
-  class Server; // where Asio is, which takes seconds to compile
+  class Server; // keeps Asio, which takes seconds to compile, out of this header
   const std::unique_ptr<Server> m_server;
 };
 

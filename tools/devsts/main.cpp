@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// The development token service: starts, tells that it is ready, ends when it is told to.
+/// The development token service: starts, writes the ready line, and waits for the reason to end.
 
 #include "https_listener.h"
 #include "options.h"
@@ -27,7 +27,7 @@
 namespace DevSts {
 namespace {
 
-/// As many connections as the machine's administrator allows.
+/// Allows as many descriptors, and so connections, as the hard limit of the process.
 void RaiseDescriptorLimit() {
   rlimit limit{};
   if (getrlimit(RLIMIT_NOFILE, &limit) == 0) {

@@ -12,7 +12,7 @@ namespace {
 
 constexpr std::chrono::hours LONGEST_MESSAGE_LIFE(24);
 
-/// What may stand in the security header, each at most once.
+/// The elements that the security header may have, each at most once.
 struct SecurityHeader {
   xmlNode *timestamp = nullptr;
   xmlNode *usernameToken = nullptr;
@@ -66,14 +66,14 @@ Envelope ReadEnvelope(const xmlDoc &document) {
   }
   const std::vector<xmlNode *> parts = ChildElements(root);
   if (parts.size() != 2 || !IsElement(*parts[0], Ns::SOAPENV, "Header") || !IsElement(*parts[1], Ns::SOAPENV, "Body")) {
-    throw Refusal(Code::CLIENT, "an envelope must hold one header and one body");
+    throw Refusal(Code::CLIENT, "an envelope must contain one header and one body");
   }
   const std::vector<xmlNode *> headers = ChildElements(*parts[0]);
   if (headers.size() != 1 || !IsElement(*headers[0], Ns::WSSE, "Security")) {
     RefuseSecurity("the message must have one security header and no other");
   }
   if (ChildElements(*parts[1]).size() != 1) {
-    throw Refusal(Code::INVALID_REQUEST, "the body must hold one element");
+    throw Refusal(Code::INVALID_REQUEST, "the body must contain one element");
   }
   return {parts[1], ReadSecurityHeader(*headers[0])};
 }
@@ -81,7 +81,7 @@ Envelope ReadEnvelope(const xmlDoc &document) {
 Time ReadTime(const xmlNode &timestamp, const char *name) {
   const std::optional<Time> time = ParseTime(TextOf(RequireChild(timestamp, Ns::WSU, name)));
   if (!time) {
-    RefuseSecurity(std::string(name) + " of the timestamp is no UTC date");
+    RefuseSecurity(std::string(name) + " of the timestamp is not a UTC date");
   }
   return *time;
 }
@@ -94,7 +94,7 @@ void CheckTimestamp(const xmlNode &timestamp, std::chrono::seconds tolerance) {
     RefuseSecurity("the timestamp's period is empty or too long");
   }
   if (created > now + tolerance) {
-    RefuseSecurity("the timestamp lies in the future");
+    RefuseSecurity("the timestamp is in the future");
   }
   if (expires + tolerance <= now) {
     throw Refusal(Code::MESSAGE_EXPIRED, "the message has expired");
@@ -109,13 +109,13 @@ PasswordCredentials ReadCredentials(const xmlNode &usernameToken) {
   return {TextOf(RequireChild(usernameToken, Ns::WSSE, "Username")), TextOf(password)};
 }
 
-/// The body and the timestamp, these very elements, must be what is signed.
+/// The signed elements must be the body and the timestamp of this envelope, and no others.
 void RequireCoverage(const Envelope &envelope, const Identifiers &identifiers) {
   std::vector<const xmlNode *> covered;
   for (const SignatureReference &reference : ReadReferences(*envelope.security.signature)) {
     const auto found = identifiers.find(reference.id);
     if (reference.isEnveloped || found == identifiers.end()) {
-      RefuseSecurity("the signature refers to what is not there");
+      RefuseSecurity("the signature refers to an element that does not exist");
     }
     covered.push_back(found->second);
   }
@@ -126,13 +126,13 @@ void RequireCoverage(const Envelope &envelope, const Identifiers &identifiers) {
   }
 }
 
-/// The certificate of the binary token, which `reference` must point at.
+/// The certificate in the binary token, to which `reference` must refer.
 Certificate BinaryTokenCertificate(const Envelope &envelope, const Identifiers &identifiers, const xmlNode &reference) {
   const xmlNode *const token = envelope.security.binaryToken;
   const std::string uri = AttributeOf(reference, "URI").value_or("");
   const auto found = identifiers.find(uri.substr(uri.empty() ? 0 : 1));
   if (!token || uri.rfind('#', 0) != 0 || found == identifiers.end() || found->second != token) {
-    throw Refusal(Code::TOKEN_UNAVAILABLE, "the signature's key reference points at no binary security token");
+    throw Refusal(Code::TOKEN_UNAVAILABLE, "the signature's key reference does not refer to a binary security token");
   }
   if (AttributeOf(*token, "ValueType").value_or("") != X509_VALUE_TYPE ||
       AttributeOf(*token, "EncodingType").value_or(BASE64_ENCODING) != BASE64_ENCODING) {
@@ -141,14 +141,14 @@ Certificate BinaryTokenCertificate(const Envelope &envelope, const Identifiers &
   return DecodeCertificate(TextOf(*token));
 }
 
-/// The certificate that the presented assertion confirms its holder by.
+/// The certificate of the key that the presented assertion is bound to.
 Certificate HolderCertificate(const Envelope &envelope, const CheckedMessage &message, const xmlNode &keyIdentifier) {
   if (!message.presentedToken || AttributeOf(keyIdentifier, "ValueType").value_or("") != SAML_ID_VALUE_TYPE ||
       TextOf(keyIdentifier) != AttributeOf(*envelope.security.assertion, "ID")) {
-    throw Refusal(Code::TOKEN_UNAVAILABLE, "the signature's key reference names no token of the message");
+    throw Refusal(Code::TOKEN_UNAVAILABLE, "the signature's key reference does not refer to a token of the message");
   }
   if (message.presentedToken->certificate.empty()) {
-    throw Refusal(Code::TOKEN_UNAVAILABLE, "a bearer token names no key that could have signed the message");
+    throw Refusal(Code::TOKEN_UNAVAILABLE, "a bearer token has no key that could have signed the message");
   }
   return DecodeCertificate(message.presentedToken->certificate);
 }
@@ -166,7 +166,7 @@ Certificate SignerCertificate(const Envelope &envelope, const CheckedMessage &me
     throw Refusal(Code::TOKEN_UNAVAILABLE, "unsupported key reference");
   }
   if (!certificate || !HasStrongKey(*certificate)) {
-    throw Refusal(Code::INVALID_TOKEN, "the signer's certificate must hold an RSA key of at least 2048 bits");
+    throw Refusal(Code::INVALID_TOKEN, "the signer's certificate must have an RSA key of at least 2048 bits");
   }
   return certificate;
 }
@@ -181,7 +181,7 @@ void CheckSignature(const Envelope &envelope, CheckedMessage &message) {
   message.signatureId = AttributeOf(*envelope.security.signature, "Id").value_or("");
 }
 
-/// A token or certificate in the header means something only beside the proof that the sender holds its key.
+/// A token or certificate in the header counts only together with the proof that the sender has its key.
 void RequireSignatureWhereNeeded(const SecurityHeader &security) {
   if (!security.signature && (security.assertion || security.binaryToken)) {
     RefuseSecurity("the message presents a token or certificate and is not signed");

@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// The checks that each message passes before the service looks at what it asks for: form, timestamp, signature.
+/// The checks of every message before its request is read: form, timestamp, signature.
 
 #pragma once
 
@@ -28,10 +28,10 @@ struct CheckedMessage {
   Identifiers identifiers;
   xmlNode *request = nullptr;                     ///< the one element in the body
   std::optional<PasswordCredentials> credentials; ///< not yet compared with anything
-  std::optional<TokenFacts> presentedToken;       ///< from the header: ours, current, and the signer's own
+  std::optional<TokenFacts> presentedToken;       ///< from the header: issued by this service, and valid now
   /// Set when the message is signed: over the body and the timestamp, by the key of this certificate.
   Certificate signer;
-  std::string signatureId; ///< the signature's own identifier, empty for none
+  std::string signatureId; ///< the signature's own identifier; empty when it has none
 };
 
 /// How far clocks may differ, and who signs tokens.

@@ -6,7 +6,7 @@
 
 namespace DevSts {
 
-/// A namespace with the prefix that the service writes it with.
+/// A namespace, with the prefix that the service uses for it.
 struct Namespace {
   const char *prefix;
   const char *uri;

@@ -19,10 +19,10 @@ NegotiationStep Negotiations::Begin(const std::string &context, const std::vecto
     const std::lock_guard<std::mutex> lock(m_mutex);
     ForgetOld();
     if (m_negotiations.size() >= MOST_AT_ONCE) {
-      throw Refusal(Code::REQUEST_FAILED, "too many negotiations have not ended");
+      throw Refusal(Code::REQUEST_FAILED, "too many unfinished negotiations");
     }
     if (!m_negotiations.try_emplace(context, Negotiation{nullptr, {}, negotiation.end}).second) {
-      throw Refusal(Code::INVALID_REQUEST, "a negotiation of that context has begun already");
+      throw Refusal(Code::INVALID_REQUEST, "a negotiation with that context has already begun");
     }
   }
   return Accept(context, leg, std::move(negotiation));
@@ -35,12 +35,12 @@ NegotiationStep Negotiations::Continue(const std::string &context, const std::ve
     ForgetOld();
     const auto found = m_negotiations.find(context);
     if (found == m_negotiations.end()) {
-      throw Refusal(Code::INVALID_REQUEST, "no negotiation of that context waits for a leg");
+      throw Refusal(Code::INVALID_REQUEST, "no negotiation with that context is waiting for a leg");
     }
     if (!found->second.acceptance) {
       throw Refusal(Code::INVALID_REQUEST, "a leg of that negotiation is being accepted");
     }
-    negotiation = std::move(found->second); // its place stays, without an acceptance
+    negotiation = std::move(found->second); // the entry stays, with a null acceptance
   }
   return Accept(context, leg, std::move(negotiation));
 }

@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// The negotiations that have begun and not ended.
+/// The negotiations that have begun and have not ended.
 
 #pragma once
 
@@ -18,7 +18,7 @@
 
 namespace DevSts {
 
-/// What the first leg's message has asked for; who it is for will be known in the end.
+/// What the message of the first leg has asked for. The subject is known only at the end.
 struct NegotiatedRequest {
   TokenFacts facts;
   std::chrono::milliseconds lifetime{0};
@@ -29,8 +29,8 @@ struct NegotiationStep {
   NegotiatedRequest request; ///< once the negotiation is complete
 };
 
-/// Each is known by its context identifier, and forgotten when it is complete, refused, or a minute old. Any number of
-/// threads may use this at once; of two that continue one negotiation at once, one is refused.
+/// A negotiation is found by its context identifier, and removed when it is complete, refused, or a minute old. Any
+/// number of threads may use this at once; when two continue one negotiation at once, one is refused.
 class Negotiations {
 public:
   using Clock = std::function<std::chrono::steady_clock::time_point()>;
@@ -40,7 +40,7 @@ public:
 
   explicit Negotiations(std::unique_ptr<const GssAcceptor> acceptor, Clock clock = std::chrono::steady_clock::now);
 
-  /// @param context the client's choice, which no other negotiation may have
+  /// @param context chosen by the client; no other negotiation may have the same
   /// @throws Refusal (wst:InvalidRequest, wst:RequestFailed, wst:FailedAuthentication)
   NegotiationStep Begin(const std::string &context, const std::vector<unsigned char> &leg, NegotiatedRequest request);
 

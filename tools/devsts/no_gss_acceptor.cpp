@@ -1,5 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
-// What stands in for gss_acceptor.cpp where there is no GSSAPI.
+// Replaces gss_acceptor.cpp in a build without the GSSAPI.
 
 #include "gss_acceptor.h"
 

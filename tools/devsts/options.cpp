@@ -13,30 +13,39 @@ constexpr int LONGEST_TOLERANCE = 24 * 3600;
 
 std::string Footer() {
   return "Faults:\n" + FaultHelp() +
-         "\nA request to URL/fault/NAME meets that fault alone, whatever --fault says.\n"
-         "Behind URL/fault/NAME/once/TEXT only the first request meets it.\n"
+         "\nA request to URL/fault/NAME gets that fault, whatever --fault says.\n"
+         "At URL/fault/NAME/once/TEXT only the first request gets it; each TEXT is counted separately.\n"
          "\nExamples:\n"
          "  ssoclient-devsts --state ~/.cache/devsts\n"
          "      Serves alice@corp.example (password wonderland) and bob@corp.example (password builder) on a free\n"
-         "      port, until it gets SIGTERM or SIGINT. The first line on standard output tells the URL and the files\n"
-         "      to trust.\n"
+         "      port, until it gets SIGTERM or SIGINT. The first line on standard output is JSON with the URL and the\n"
+         "      files to trust.\n"
          "  ssoclient-devsts --state DIR --port 8443 --users users.json\n"
          "      users.json: "
          "[{\"name\":\"carol@corp.example\",\"password\":\"...\",\"first\":\"Carol\",\"last\":\"Danvers\",\n"
          "      \"groups\":[\"users@corp.example\"]}]\n"
          "  ssoclient-devsts --state DIR --keytab sts.keytab\n"
-         "      Negotiates as well, as every service whose key is in the keytab. alice@CORP.EXAMPLE is the user\n"
+         "      Also negotiates, for every service whose key is in the keytab. alice@CORP.EXAMPLE is the user\n"
          "      alice@corp.example.\n"
          "  ssoclient-devsts --state DIR --charset ISO-8859-1\n"
-         "      Takes what it receives for ISO-8859-1, as services do that get no charset, and answers so.\n"
+         "      Reads requests as ISO-8859-1, as services do that get no charset, and answers in it.\n"
          "  ssoclient-devsts --state DIR --fault wrong-signer\n"
-         "      Signs every token with a key that nobody trusts.\n";
+         "      Signs every token with a key that no client trusts.\n";
+}
+
+/// @throws CLI::ValidationError for an unknown name
+Fault RequireFault(const std::string &name) {
+  const std::optional<Fault> fault = ParseFault(name);
+  if (!fault) {
+    throw CLI::ValidationError("--fault", "unknown fault '" + name + "'; see --help");
+  }
+  return *fault;
 }
 
 } // namespace
 
 std::variant<Options, int> ReadOptions(int argc, char **argv) {
-  CLI::App app("A WS-Trust 1.3 token service for development and tests. It listens on loopback alone.",
+  CLI::App app("A WS-Trust 1.3 token service for development and tests. It listens only on loopback.",
                "ssoclient-devsts");
   app.set_version_flag("--version", "ssoclient-devsts " SSOCLIENT_VERSION);
   app.footer(Footer());
@@ -44,13 +53,14 @@ std::variant<Options, int> ReadOptions(int argc, char **argv) {
   Options options;
   std::string faultName;
   int tolerance = static_cast<int>(options.tolerance.count());
-  app.add_option("--state", options.state, "Folder of keys and certificates, made when missing")->required();
-  app.add_option("--port", options.port, "Port to listen on; 0 takes a free one")->capture_default_str();
-  app.add_option("--users", options.users, "JSON file of the users; two are known without it")->type_name("FILE");
+  app.add_option("--state", options.state, "Folder for keys and certificates; created when it does not exist")
+      ->required();
+  app.add_option("--port", options.port, "Port to listen on; 0 chooses a free one")->capture_default_str();
+  app.add_option("--users", options.users, "JSON file of the users; without it there are two")->type_name("FILE");
   app.add_option("--keytab", options.keytab, "Keytab of the service's keys, for SPNEGO with Kerberos")
       ->type_name("FILE");
-  app.add_option("--fault", faultName, "Misbehave at every request; names below")->type_name("NAME");
-  app.add_option("--charset", options.charset, "Read requests and answer in this charset")
+  app.add_option("--fault", faultName, "Misbehave at every request; the names are listed below")->type_name("NAME");
+  app.add_option("--charset", options.charset, "Read requests and write answers in this charset")
       ->capture_default_str()
       ->type_name("NAME")
       ->check(CLI::IsMember({"UTF-8", "ISO-8859-1", "windows-1252"}, CLI::ignore_case));
@@ -61,11 +71,7 @@ std::variant<Options, int> ReadOptions(int argc, char **argv) {
   try {
     app.parse(argc, argv);
     if (!faultName.empty()) {
-      const std::optional<Fault> fault = ParseFault(faultName);
-      if (!fault) {
-        throw CLI::ValidationError("--fault", "no fault is named '" + faultName + "'; see --help");
-      }
-      options.fault = *fault;
+      options.fault = RequireFault(faultName);
     }
   } catch (const CLI::Success &success) { // --help and --version
     return app.exit(success);

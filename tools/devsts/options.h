@@ -26,8 +26,8 @@ struct Options {
   bool untilEof = false;
 };
 
-/// The options, or the exit code with which the program ends because help was asked for or the line is wrong; that has
-/// been written then.
+/// The options; or the exit code, when the command line is wrong or asks for help. The help or the error has then been
+/// written.
 std::variant<Options, int> ReadOptions(int argc, char **argv);
 
 } // namespace DevSts

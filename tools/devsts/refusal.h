@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// What the service throws at a message that it does not accept, and the fault codes of the standards.
+/// The exception for a message that the service refuses, and the fault codes of the standards.
 
 #pragma once
 
@@ -36,7 +36,7 @@ constexpr FaultCode INVALID_TIME_RANGE{Ns::WST, "InvalidTimeRange"};
 constexpr FaultCode UNABLE_TO_RENEW{Ns::WST, "UnableToRenew"};
 } // namespace Code
 
-/// A message is refused: becomes a SOAP fault.
+/// A message is refused. The service answers with a SOAP fault.
 class Refusal : public std::runtime_error {
 public:
   Refusal(const FaultCode &code, const std::string &reason) : std::runtime_error(reason), m_code(code) {}

@@ -15,7 +15,7 @@ namespace {
 
 constexpr std::string_view PATH = "/sts";
 constexpr std::string_view FAULT_PATH = "/sts/fault/";
-constexpr std::string_view ONCE = "/once/"; // behind a fault's name, before a text that tells whose "once" it is
+constexpr std::string_view ONCE = "/once/"; // follows the name of a fault; each text after it has a "once" of its own
 constexpr std::string_view MEDIA_TYPE = "text/xml";
 
 std::string Lower(std::string_view text) {
@@ -54,7 +54,7 @@ void LogLine(const std::string &line) noexcept {
       text += isPlain ? std::string(1, c) : std::string(escaped.data());
     }
     text += '\n';
-    // One call, so that lines of several threads do not mix. A log that cannot be written stops nothing.
+    // A single call, so that lines of several threads do not mix. A log that cannot be written is ignored.
     [[maybe_unused]] const ssize_t written = write(STDERR_FILENO, text.data(), text.size());
   } catch (const std::exception &) { // NOLINT(bugprone-empty-catch): out of memory; the line is lost
   }

@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// From an HTTP request to what is delivered: paths, methods, media types, faults, the log.
+/// From an HTTP request to the delivery of its answer: paths, methods, media types, faults, the log.
 
 #pragma once
 
@@ -30,7 +30,7 @@ struct HttpRequest {
 /// Any number of threads may use it at once.
 class RequestHandler {
 public:
-  /// `service` outlives the handler. `fault` is that of every request that names none of its own; `charset` that of every
+  /// `service` outlives the handler. `fault` is for every request whose path has no fault; `charset` is for every
   /// message.
   RequestHandler(const TokenService &service, const Fault &fault, const Charset &charset)
       : m_service(service), m_fault(fault), m_charset(charset) {}
@@ -39,9 +39,9 @@ public:
 
 private:
   Delivery Answer(const HttpRequest &request) const;
-  /// The fault that a path below /sts/fault/ names; nothing when there is none of that name.
+  /// The fault in a path below /sts/fault/; none for an unknown name.
   std::optional<Fault> FaultOf(std::string_view path) const;
-  /// Whether this is the first time that the text is met.
+  /// Whether this is the first request with that text.
   bool IsFirst(std::string_view onceOnly) const;
 
   const TokenService &m_service;
@@ -51,7 +51,7 @@ private:
   mutable std::set<std::string, std::less<>> m_met; ///< guarded by the mutex
 };
 
-/// Writes one line to standard error, with a time, and with what could steer a terminal made visible.
+/// Writes one line to standard error, with the time. Characters that could control a terminal are escaped.
 void LogLine(const std::string &line) noexcept;
 
 } // namespace DevSts

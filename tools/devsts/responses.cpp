@@ -82,7 +82,8 @@ Document ValidateResponse(bool isValid) {
 Document FaultResponse(const FaultCode *code, const std::string &reason) {
   Document document = NewEnvelope();
   xmlNode &fault = AddElement(BodyOf(*document), Ns::SOAPENV, "Fault");
-  // SOAP 1.1 gives the children of a fault no namespace; the code is a qualified name, so its prefix must be declared.
+  // In SOAP 1.1 the children of a fault have no namespace. The code is a qualified name, so its prefix must be
+  // declared.
   const auto add = [&fault](const char *name, const std::string &text) -> xmlNode & {
     xmlNode &element = AddElement(fault, Ns::SOAPENV, name, text);
     xmlSetNs(&element, nullptr);

@@ -15,10 +15,10 @@ namespace DevSts {
 /// The answer to an issue request: the token in a response in a collection.
 Document IssueResponse(const xmlDoc &token);
 
-/// The answer to a leg of a negotiation that goes on: the service's leg.
+/// The answer to a leg of an unfinished negotiation: the service's leg.
 Document LegResponse(const std::string &context, const std::vector<unsigned char> &leg);
 
-/// The answer to the last leg: the token, and the service's leg unless that is empty.
+/// The answer to the last leg: the token, and the service's leg unless it is empty.
 Document NegotiatedResponse(const std::string &context, const std::vector<unsigned char> &leg, const xmlDoc &token);
 
 /// The answer to a renew request: the token in a response.

@@ -14,7 +14,7 @@
 namespace DevSts {
 
 EndSignals::EndSignals() : m_descriptor(-1) {
-  std::signal(SIGPIPE, SIG_IGN); // a client that has gone is no reason to end
+  std::signal(SIGPIPE, SIG_IGN); // a client that closes its connection must not end the service
   sigset_t signals;
   sigemptyset(&signals);
   sigaddset(&signals, SIGTERM);

@@ -6,8 +6,8 @@
 
 namespace DevSts {
 
-/// Catches SIGTERM and SIGINT, for the rest of the process. Made before any thread starts, so that all of them leave the
-/// signals to it.
+/// Catches SIGTERM and SIGINT, for the rest of the process. Create it before any thread starts, so that all threads
+/// inherit the signal mask.
 class EndSignals {
 public:
   EndSignals();
@@ -15,7 +15,7 @@ public:
   EndSignals &operator=(const EndSignals &) = delete;
   ~EndSignals();
 
-  /// Returns at one of the signals or, when asked to, at the end of standard input.
+  /// Returns at one of the signals or, if `untilEof` is set, at the end of standard input.
   void Wait(bool untilEof) const;
 
 private:

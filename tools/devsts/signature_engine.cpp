@@ -21,7 +21,7 @@ namespace DevSts {
 
 namespace {
 
-// Longer than any certificate, so that Base64 text stands in one line; 0 is not taken everywhere.
+// Longer than any certificate, so that Base64 text has no line breaks. Not every version of libxmlsec1 accepts 0.
 constexpr int LINE_SIZE = 1 << 20;
 
 struct ContextDeleter {
@@ -29,7 +29,7 @@ struct ContextDeleter {
 };
 using Context = std::unique_ptr<xmlSecDSigCtx, ContextDeleter>;
 
-// What is refused is logged by the service in one line of its own.
+// The service itself logs a refusal, in one line.
 void DropError(const char *, int, const char *, const char *, const char *, int, const char *) {}
 void DropXmlError(void *, const char *, ...) {} // NOLINT(cert-dcl50-cpp): libxml2's own signature
 
@@ -54,7 +54,7 @@ void RequireAlgorithm(const xmlNode &method, std::string_view expected) {
   }
 }
 
-/// Exactly these children, in this order.
+/// The children of `parent`. @throws Refusal unless they are exactly these, in this order
 std::vector<xmlNode *> RequireChildren(const xmlNode &parent, std::initializer_list<const char *> names) {
   std::vector<xmlNode *> children = ChildElements(parent);
   bool matches = children.size() == names.size();
@@ -68,7 +68,7 @@ std::vector<xmlNode *> RequireChildren(const xmlNode &parent, std::initializer_l
   return children;
 }
 
-// libxmlsec1 makes an XPointer of the identifier, so it must not hold a quotation mark.
+// libxmlsec1 puts the identifier into an XPointer, so it must not contain a quotation mark.
 bool IsPlainIdentifier(std::string_view id) {
   constexpr std::string_view PLAIN = "ABCDEFGHIJKLMNOPQRSTUVWXYZabcdefghijklmnopqrstuvwxyz0123456789_.-";
   return !id.empty() && id.find_first_not_of(PLAIN) == std::string_view::npos;
@@ -80,7 +80,7 @@ SignatureReference ReadReference(const xmlNode &reference) {
   SignatureReference result;
   result.id = uri.substr(uri.empty() ? 0 : 1);
   if (uri.rfind('#', 0) != 0 || !IsPlainIdentifier(result.id)) {
-    throw Refusal(Code::INVALID_SECURITY, "a signature may refer to elements of the message alone");
+    throw Refusal(Code::INVALID_SECURITY, "a signature may refer only to elements of the message");
   }
   std::vector<xmlNode *> transforms = ChildElements(*parts[0]);
   result.isEnveloped = transforms.size() == 2;
@@ -120,7 +120,7 @@ SignatureKey LoadSigningKey(const Identity &identity) {
   SignatureKey key(
       xmlSecOpenSSLAppKeyLoad(identity.keyFile.c_str(), xmlSecKeyDataFormatPem, nullptr, nullptr, nullptr));
   if (!key || xmlSecOpenSSLAppKeyCertLoad(key.get(), identity.certificateFile.c_str(), xmlSecKeyDataFormatPem) < 0) {
-    throw std::runtime_error(identity.keyFile.string() + ": libxmlsec1 does not read it");
+    throw std::runtime_error(identity.keyFile.string() + ": libxmlsec1 cannot read it");
   }
   return key;
 }
@@ -139,7 +139,7 @@ SignatureKey PublicKeyOf(const X509 &certificate) {
   }
   if (xmlSecKeySetValue(key.get(), data) < 0) {
     xmlSecKeyDataDestroy(data);
-    throw std::runtime_error("a key that libxmlsec1 does not take");
+    throw std::runtime_error("a key that libxmlsec1 does not accept");
   }
   return key;
 }

@@ -1,6 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// XML signatures by libxmlsec1, held to the one profile that messages and tokens use: exclusive C14N, RSA-SHA256, SHA-256.
+/// XML signatures by libxmlsec1, restricted to the profile that messages and tokens use: exclusive C14N, RSA-SHA256,
+/// SHA-256.
 
 #pragma once
 
@@ -16,7 +17,8 @@
 
 namespace DevSts {
 
-/// Starts libxml2 and libxmlsec1, and ends them. One for the whole process, before any thread uses either.
+/// Initialises libxml2 and libxmlsec1, and cleans up after them. Create one for the whole process, before any thread
+/// uses either.
 class SignatureEngine {
 public:
   SignatureEngine();
@@ -36,21 +38,22 @@ SignatureKey LoadSigningKey(const Identity &identity);
 /// The public key of a certificate. @throws std::runtime_error
 SignatureKey PublicKeyOf(const X509 &certificate);
 
-/// What a reference of a signature says.
+/// The content of a signature's reference.
 struct SignatureReference {
   std::string id; ///< of the element that is signed
   bool isEnveloped = false;
 };
 
-/// The references of a `ds:Signature`, in their order. @throws Refusal (wsse:UnsupportedAlgorithm, wsse:InvalidSecurity)
-/// unless it has exactly the profile's form: one transform, the canonicalisation, preceded by "enveloped" at most
+/// The references of a `ds:Signature`, in their order. @throws Refusal (wsse:UnsupportedAlgorithm,
+/// wsse:InvalidSecurity) unless it has exactly the profile's form. Its transforms are the canonicalisation, optionally
+/// preceded by "enveloped".
 std::vector<SignatureReference> ReadReferences(const xmlNode &signature);
 
-/// Whether the signature's value and all digests are right, by this key and whatever `KeyInfo` says. The identifiers of
-/// its document have been registered, and `ReadReferences` has passed.
+/// Whether the signature's value and all digests are right, by this key and whatever `KeyInfo` says. Call it after
+/// `RegisterIdentifiers` for the document and a successful `ReadReferences`.
 bool VerifiesWith(xmlNode &signature, const SignatureKey &key);
 
-/// Signs the whole `element`, whose identifier is `id`, with an enveloped signature behind its child `sibling`.
+/// Signs the whole `element`, whose identifier is `id`, with an enveloped signature after its child `sibling`.
 /// @throws std::runtime_error
 void SignEnveloped(xmlNode &element, const std::string &id, xmlNode &sibling, const SignatureKey &key);
 

@@ -36,7 +36,7 @@ struct Extension {
   const char *value;
 };
 
-/// What a certificate is for.
+/// What a certificate is used for.
 struct Purpose {
   const char *file;
   const char *commonName;
@@ -84,7 +84,7 @@ void RequireOpenSsl(bool success, const char *what) {
   }
 }
 
-/// Holds other services off while this one makes what is missing.
+/// Makes other services wait while this one creates what is missing.
 class FolderLock {
 public:
   explicit FolderLock(const fs::path &folder) : m_descriptor(open(folder.c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC)) {
@@ -212,23 +212,23 @@ void MakeIdentity(const Purpose &purpose, const Identity &files, const Identity 
 Identity OpenIdentity(const fs::path &folder, const Purpose &purpose, const Identity *authority) {
   const fs::path base = folder / purpose.file;
   Identity identity{base.string() + ".key", base.string() + ".crt", nullptr};
-  // The certificate is written last, so a key alone is what an interrupted start has left.
+  // The certificate is written last, so a key without a certificate is left over from an interrupted start.
   if (!fs::exists(identity.certificateFile)) {
     MakeIdentity(purpose, identity, authority);
   }
   identity.certificate = ReadCertificate(identity.certificateFile);
-  // OpenSSL decodes the extensions when they are first asked for: better now than by several connections at once.
+  // OpenSSL decodes the extensions at their first use. Do it now, before several connections use them at once.
   X509_check_purpose(identity.certificate.get(), -1, 0);
   const PrivateKey key = ReadKey(identity.keyFile);
   if (X509_check_private_key(identity.certificate.get(), key.get()) != 1) {
-    FailAt(identity.certificateFile, "does not belong to the key beside it");
+    FailAt(identity.certificateFile, "does not match the key in the same folder");
   }
   if (!purpose.isSelfSigned &&
       X509_verify(identity.certificate.get(), X509_get0_pubkey(authority->certificate.get())) != 1) {
-    FailAt(identity.certificateFile, "is of another authority; remove the state folder, and it is made anew");
+    FailAt(identity.certificateFile, "was issued by another authority; remove the state folder to have it made anew");
   }
   if (X509_cmp_current_time(X509_get0_notAfter(identity.certificate.get())) <= 0) {
-    FailAt(identity.certificateFile, "has expired; remove the state folder, and it is made anew");
+    FailAt(identity.certificateFile, "has expired; remove the state folder to have it made anew");
   }
   return identity;
 }

@@ -20,16 +20,16 @@ struct Identity {
 
 struct StateFolder {
   std::filesystem::path path;
-  Identity authority;   ///< issued all others but `foreign`
+  Identity authority;   ///< issued all others except `foreign`
   Identity tls;         ///< the HTTPS server's
   Identity signing;     ///< signs tokens
-  Identity foreign;     ///< signs the tokens that nobody is to trust
+  Identity foreign;     ///< signs the tokens that no client should trust
   Identity client;      ///< for use by clients: principal client@corp.example
-  Identity otherClient; ///< likewise: other-client@corp.example
+  Identity otherClient; ///< another one: principal other-client@corp.example
 };
 
-/// Opens the folder, makes it (for its owner alone) and what is missing in it. Two services may open the same folder at
-/// once. @throws std::runtime_error naming the file when something is there and cannot be used
+/// Opens the folder. Creates it, readable only for its owner, and the files that are missing in it. Two services may
+/// open the same folder at once. @throws std::runtime_error naming the file that exists and cannot be used
 StateFolder OpenStateFolder(const std::filesystem::path &path);
 
 } // namespace DevSts

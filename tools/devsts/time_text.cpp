@@ -12,7 +12,7 @@ namespace {
 
 using namespace std::chrono;
 
-constexpr std::string_view FORM = "0000-00-00T00:00:00"; // 0 stands for any digit
+constexpr std::string_view FORM = "0000-00-00T00:00:00"; // 0 means any digit
 
 bool HasForm(std::string_view text) {
   for (std::size_t i = 0; i < FORM.size(); ++i) {

@@ -16,10 +16,10 @@ using Time = std::chrono::sys_time<std::chrono::milliseconds>;
 
 Time Now();
 
-/// As "2026-01-02T03:04:05.006Z".
+/// For example "2026-01-02T03:04:05.006Z".
 std::string TimeText(Time time);
 
-/// Reads that form, the fraction optional and of any length (cut to milliseconds). Nothing for any other text.
+/// Reads that form. The fraction is optional, and cut to milliseconds. Returns none for any other text.
 std::optional<Time> ParseTime(std::string_view text);
 
 } // namespace DevSts

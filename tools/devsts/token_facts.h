@@ -28,18 +28,18 @@ struct AdviceEntry {
 };
 
 struct TokenFacts {
-  std::string subject;     ///< as "alice@corp.example"
-  Time authenticated;      ///< when the subject proved to be who it is
-  std::string context;     ///< how, a SAML authentication context class
-  std::string certificate; ///< Base64 DER of the holder's, empty for a bearer token
+  std::string subject;     ///< such as "alice@corp.example"
+  Time authenticated;      ///< when the subject was authenticated
+  std::string context;     ///< how: a SAML authentication context class
+  std::string certificate; ///< Base64 DER of the holder's; empty for a bearer token
   Time notBefore;
   Time notOnOrAfter;
-  std::uint64_t renewals = 0;    ///< how often the token may be renewed yet
-  std::uint64_t delegations = 0; ///< how often it may be delegated yet
+  std::uint64_t renewals = 0;    ///< how often the token may still be renewed
+  std::uint64_t delegations = 0; ///< how often it may still be delegated
   std::vector<DelegationStep> delegation;
   std::vector<std::string> audience;
   std::vector<AdviceEntry> advice;
-  std::vector<std::string> groups; ///< as "corp.example\admins"
+  std::vector<std::string> groups; ///< such as "corp.example\admins"
   std::string first;
   std::string last;
   bool isSolution = false;

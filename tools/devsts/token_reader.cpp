@@ -9,7 +9,7 @@ namespace DevSts {
 namespace {
 
 [[noreturn]] void RefuseToken(const std::string &reason) {
-  throw Refusal(Code::INVALID_TOKEN, reason); // the code is the caller's in the end
+  throw Refusal(Code::INVALID_TOKEN, reason); // `ReadIssuedToken` replaces the code
 }
 
 std::string RequireAttribute(const xmlNode &element, const char *name) {
@@ -23,7 +23,7 @@ std::string RequireAttribute(const xmlNode &element, const char *name) {
 Time RequireTime(const xmlNode &element, const char *name) {
   const std::optional<Time> time = ParseTime(RequireAttribute(element, name));
   if (!time) {
-    RefuseToken(std::string("the token's ") + name + " is no date");
+    RefuseToken(std::string("the token's ") + name + " is not a date");
   }
   return *time;
 }
@@ -43,7 +43,7 @@ void VerifySignature(const xmlNode &assertion, const Identifiers &identifiers, c
     RefuseToken("the token's signature does not cover the token");
   }
   if (!VerifiesWith(signature, signer)) {
-    RefuseToken("the token's signature is not this service's");
+    RefuseToken("the token is not signed by this service");
   }
 }
 

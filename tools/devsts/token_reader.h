@@ -11,9 +11,9 @@
 
 namespace DevSts {
 
-/// The facts of the assertion, once its signature by `signer` over the whole of it is verified. Its dates are not judged.
-/// `identifiers` are those of the assertion's document.
-/// @throws Refusal (`code`) when it is not one of ours, whole and unchanged
+/// Verifies the signature by `signer` over the whole assertion, and returns the assertion's facts. Its dates are not
+/// checked. `identifiers` are those of the assertion's document.
+/// @throws Refusal (`code`) when this service did not issue it, or when it was changed
 TokenFacts ReadIssuedToken(const xmlNode &assertion, const Identifiers &identifiers, const SignatureKey &signer,
                            const FaultCode &code);
 

@@ -17,7 +17,7 @@ namespace {
 constexpr std::uint64_t RENEWALS = 10;
 constexpr std::uint64_t DELEGATIONS = 10;
 
-/// "admins@corp.example" as tokens write it: "corp.example\admins".
+/// The form that a group has in tokens: "corp.example\admins" for "admins@corp.example".
 std::string GroupText(const std::string &group) {
   const std::size_t at = group.rfind('@');
   return group.substr(at + 1) + "\\" + group.substr(0, at);
@@ -28,18 +28,18 @@ void SetLife(TokenFacts &facts, std::chrono::milliseconds lifetime) {
   facts.notOnOrAfter = facts.notBefore + lifetime;
 }
 
-/// The key that a holder-of-key token is to confirm is the one that has signed the request.
+/// The certificate for a holder-of-key token, which is bound to the key that has signed the request.
 std::string ProofCertificate(const CheckedMessage &message, const TrustRequest &request) {
   if (!request.wantsHolderOfKey) {
     return {};
   }
   if (!message.signer) {
-    throw Refusal(Code::INVALID_REQUEST, "a holder-of-key token is asked for without proof of a key");
+    throw Refusal(Code::INVALID_REQUEST, "the request asks for a holder-of-key token without proof of a key");
   }
-  // An exchange names no key: it is the presented token's.
+  // A request for an exchange has no wst:UseKey: the key is the presented token's.
   const bool mayOmitUseKey = message.presentedToken.has_value();
   if (request.useKey ? *request.useKey != message.signatureId : !mayOmitUseKey) {
-    throw Refusal(Code::INVALID_REQUEST, "wst:UseKey does not name the message's signature");
+    throw Refusal(Code::INVALID_REQUEST, "wst:UseKey does not refer to the message's signature");
   }
   return EncodeCertificate(*message.signer);
 }
@@ -62,11 +62,11 @@ void ApplyDelegation(TokenFacts &facts, const TrustRequest &request, const Check
 void RequireAction(std::string_view action, const TrustRequest &request) {
   const std::string expected = std::string(Ns::WST.uri) + "/RST/" + RequestTypeName(request.type);
   if (action != expected) {
-    throw Refusal(Code::INVALID_REQUEST, "the SOAPAction does not fit the message");
+    throw Refusal(Code::INVALID_REQUEST, "the SOAPAction does not match the message");
   }
 }
 
-/// What the token is to say, who it is for apart.
+/// Sets all facts that the request asks for; the subject is set elsewhere.
 void ApplyRequest(TokenFacts &facts, const CheckedMessage &message, const TrustRequest &request) {
   facts.certificate = ProofCertificate(message, request);
   facts.audience = request.audience;
@@ -84,7 +84,7 @@ void SetUser(TokenFacts &facts, const User &user, const char *context) {
   std::transform(user.groups.begin(), user.groups.end(), std::back_inserter(facts.groups), GroupText);
 }
 
-/// "alice@CORP.EXAMPLE" as the service names its users: "alice@corp.example".
+/// The user's name for a principal: "alice@corp.example" for "alice@CORP.EXAMPLE".
 std::string UserOf(std::string principal) {
   const std::size_t at = std::min(principal.rfind('@'), principal.size());
   std::transform(principal.begin() + static_cast<std::ptrdiff_t>(at), principal.end(),
@@ -96,7 +96,7 @@ std::string UserOf(std::string principal) {
 std::string ReadContext(const xmlNode &request) {
   const std::optional<std::string> context = AttributeOf(request, "Context");
   if (!context || context->empty()) {
-    throw Refusal(Code::INVALID_REQUEST, "a leg of a negotiation must name its context");
+    throw Refusal(Code::INVALID_REQUEST, "a leg of a negotiation must have a context");
   }
   return *context;
 }
@@ -109,7 +109,7 @@ std::vector<unsigned char> ReadLeg(const xmlNode &exchange) {
   const std::string text = TextOf(exchange);
   std::vector<unsigned char> leg = DecodeBase64(text);
   if (leg.empty() && !text.empty()) {
-    throw Refusal(Code::INVALID_REQUEST, "the binary exchange is no Base64");
+    throw Refusal(Code::INVALID_REQUEST, "the binary exchange is not Base64");
   }
   return leg;
 }
@@ -141,7 +141,7 @@ SoapAnswer TokenService::Answer(std::string_view action, std::string_view messag
     if (fault.document == DocumentFault::SOAP_FAULT_WITHOUT_TEXT) {
       throw Refusal(Code::FAILED_AUTHENTICATION, "");
     }
-    answer.body = SpoilResponse(*response, fault.document);
+    answer.body = CorruptResponse(*response, fault.document);
   } catch (const Refusal &refusal) {
     const FaultCode &code = refusal.GetCode();
     answer.status = 500;
@@ -186,7 +186,7 @@ Document TokenService::Issue(const CheckedMessage &message, const TrustRequest &
 Document TokenService::BeginNegotiation(const CheckedMessage &message, const TrustRequest &request, const Fault &fault,
                                         std::string &log) const {
   if (message.presentedToken || message.credentials) {
-    throw Refusal(Code::INVALID_SECURITY, "the message negotiates and presents a token or a password as well");
+    throw Refusal(Code::INVALID_SECURITY, "the message negotiates and also presents a token or a password");
   }
   const std::string context = ReadContext(*message.request);
   NegotiatedRequest negotiated;
@@ -199,7 +199,7 @@ Document TokenService::BeginNegotiation(const CheckedMessage &message, const Tru
 Document TokenService::ContinueNegotiation(std::string_view action, const CheckedMessage &message, const Fault &fault,
                                            std::string &log) const {
   if (action != std::string(Ns::WST.uri) + "/RSTR/Issue") {
-    throw Refusal(Code::INVALID_REQUEST, "the SOAPAction does not fit the message");
+    throw Refusal(Code::INVALID_REQUEST, "the SOAPAction does not match the message");
   }
   const std::string context = ReadContext(*message.request);
   const std::vector<unsigned char> leg = ReadLeg(RequireChild(*message.request, Ns::WST, "BinaryExchange"));
@@ -272,7 +272,7 @@ TokenFacts TokenService::Authenticate(const CheckedMessage &message) const {
   if (message.signer) {
     return FactsOfCertificate(*message.signer);
   }
-  throw Refusal(Code::FAILED_AUTHENTICATION, "the message holds nothing that tells who sent it");
+  throw Refusal(Code::FAILED_AUTHENTICATION, "the message does not say who sent it");
 }
 
 TokenFacts TokenService::FactsOfUser(const PasswordCredentials &credentials) const {
@@ -288,7 +288,7 @@ TokenFacts TokenService::FactsOfUser(const PasswordCredentials &credentials) con
 void TokenService::SetClient(TokenFacts &facts, const std::string &principal) const {
   const User *const user = m_users.Find(UserOf(principal));
   if (!user) {
-    throw Refusal(Code::FAILED_AUTHENTICATION, principal + " is none of the users");
+    throw Refusal(Code::FAILED_AUTHENTICATION, "unknown user " + principal);
   }
   SetUser(facts, *user, KERBEROS_CONTEXT);
 }
@@ -296,7 +296,8 @@ void TokenService::SetClient(TokenFacts &facts, const std::string &principal) co
 TokenFacts TokenService::FactsOfCertificate(X509 &certificate) const {
   const std::string principal = PrincipalOf(certificate);
   if (principal.empty() || !IsClientOf(certificate, *m_state.authority.certificate)) {
-    throw Refusal(Code::FAILED_AUTHENTICATION, "the certificate is none that the service's authority gave a client");
+    throw Refusal(Code::FAILED_AUTHENTICATION,
+                  "the certificate is not a client certificate of the service's authority");
   }
   TokenFacts facts;
   facts.subject = principal;
@@ -307,9 +308,9 @@ TokenFacts TokenService::FactsOfCertificate(X509 &certificate) const {
 }
 
 Document TokenService::MakeToken(TokenFacts facts, TokenFault fault) const {
-  SpoilFacts(facts, fault);
+  CorruptFacts(facts, fault);
   Document token = BuildToken(facts);
-  SpoilToken(*token, fault);
+  CorruptToken(*token, fault);
   if (fault != TokenFault::UNSIGNED) {
     SignToken(*token, fault == TokenFault::WRONG_SIGNER ? m_foreignSigner : m_signer);
   }

@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// The token service itself: a SOAP request in, a SOAP answer out.
+/// The token service itself: from a SOAP request to a SOAP answer.
 
 #pragma once
 
@@ -21,18 +21,18 @@ namespace DevSts {
 struct SoapAnswer {
   int status = 200;
   std::string body;
-  std::string log; ///< what happened, in words; nothing secret
+  std::string log; ///< what happened, as text without secrets
 };
 
 /// Any number of threads may use it at once.
 class TokenService {
 public:
-  /// `state` outlives the service. Without an acceptor, nobody can negotiate.
+  /// `state` outlives the service. Without an acceptor, the service does not negotiate.
   /// @throws std::runtime_error when a key cannot be used
   TokenService(const StateFolder &state, Users users, std::chrono::seconds tolerance,
                std::unique_ptr<const GssAcceptor> acceptor);
 
-  /// `action` is the SOAPAction header's text, without quotation marks. A refusal is an answer too.
+  /// `action` is the text of the SOAPAction header, without quotation marks. A refusal is also an answer.
   SoapAnswer Answer(std::string_view action, std::string_view message, const Fault &fault) const;
 
 private:
@@ -61,7 +61,7 @@ private:
   const SignatureKey m_foreignSigner;
   const SignatureKey m_verifier;
   const MessagePolicy m_policy;
-  const std::unique_ptr<Negotiations> m_negotiations; // null when nobody can negotiate
+  const std::unique_ptr<Negotiations> m_negotiations; // null when the service does not negotiate
 };
 
 } // namespace DevSts

@@ -142,7 +142,7 @@ const char *RequestTypeName(RequestType type) {
 
 TrustRequest ReadTrustRequest(const xmlNode &request) {
   if (!IsElement(request, Ns::WST, "RequestSecurityToken")) {
-    RefuseRequest("the body holds no wst:RequestSecurityToken");
+    RefuseRequest("the body does not contain a wst:RequestSecurityToken");
   }
   TrustRequest read;
   read.type = ReadRequestType(request);

@@ -19,7 +19,7 @@ enum class RequestType { ISSUE, RENEW, VALIDATE };
 struct TrustRequest {
   RequestType type = RequestType::ISSUE;
   bool wantsHolderOfKey = false;
-  std::optional<std::string> useKey; ///< the identifier of the signature whose key the token is to confirm
+  std::optional<std::string> useKey; ///< the identifier of the signature whose key the token is to be bound to
   std::chrono::milliseconds lifetime{0};
   bool renewable = false;
   bool delegable = false;
@@ -27,10 +27,10 @@ struct TrustRequest {
   std::vector<std::string> audience;
   std::vector<AdviceEntry> advice;
   const xmlNode *target = nullptr;         ///< the assertion to renew or validate; null for an issue request
-  const xmlNode *binaryExchange = nullptr; ///< a leg of a negotiation; null for none
+  const xmlNode *binaryExchange = nullptr; ///< a leg of a negotiation; null when there is none
 };
 
-/// The text of the request type, as it stands at the end of the SOAP action as well.
+/// The name of the request type, with which the SOAP action ends too.
 const char *RequestTypeName(RequestType type);
 
 /// @throws Refusal (wst:InvalidRequest, wst:InvalidTimeRange)

@@ -23,7 +23,7 @@ constexpr const char *KNOWN_USERS = R"([
    "groups": ["users@corp.example"]}
 ])";
 
-/// A principal's text: a name, "@" and a domain, and no character that XML could not carry.
+/// Requires a name, "@" and a domain, without characters that XML cannot represent.
 void RequirePrincipal(const std::string &text) {
   const std::size_t at = text.rfind('@');
   bool isPrintable = true;
@@ -54,7 +54,7 @@ std::map<std::string, User> ReadUsers(const Json &json) {
     User user = ReadUser(entry);
     const std::string name = user.name;
     if (!users.emplace(name, std::move(user)).second) {
-      throw std::runtime_error("'" + name + "' stands twice");
+      throw std::runtime_error("'" + name + "' occurs twice");
     }
   }
   return users;
@@ -78,7 +78,7 @@ Users::Users(const std::filesystem::path &file) {
   try {
     m_users = ReadUsers(Json::parse(stream));
   } catch (const Json::parse_error &failure) {
-    // Its own words quote what was read last, which may be a password.
+    // The parser's own message quotes what was read last, which may be a password.
     throw std::runtime_error(file.string() + ": not JSON at byte " + std::to_string(failure.byte));
   } catch (const std::exception &failure) {
     throw std::runtime_error(file.string() + ": " + failure.what());
@@ -92,7 +92,7 @@ const User *Users::Find(const std::string &name) const {
 
 const User *Users::Authenticate(const std::string &name, std::string_view password) const {
   const User *const user = Find(name);
-  // Digests have one length, so that the comparison tells nothing about the password's.
+  // Digests have a fixed length, so that the time of the comparison does not reveal the length of the password.
   const Digest expected = DigestOf(user ? std::string_view(user->password) : std::string_view());
   const Digest given = DigestOf(password);
   const bool isRight = CRYPTO_memcmp(expected.data(), given.data(), expected.size()) == 0;

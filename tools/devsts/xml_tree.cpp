@@ -33,7 +33,7 @@ Node &RequireMemory(Node *node) {
 // Called by libxml2 as soon as it sees a DOCTYPE, before it reads any declaration in it.
 void StopAtDoctype(void *context, const xmlChar *, const xmlChar *, const xmlChar *) {
   auto *const parser = static_cast<xmlParserCtxt *>(context);
-  parser->_private = parser; // tells that this is why it stopped
+  parser->_private = parser; // marks that the DOCTYPE is why it stopped
   xmlStopParser(parser);
 }
 
@@ -63,11 +63,11 @@ std::string ValueOf(const xmlAttr &attribute) {
 
 void RegisterIdentifier(xmlNode &element, xmlAttr &attribute, Identifiers &identifiers) {
   const std::string value = ValueOf(attribute);
-  // libxml2 knows xml:id by itself, and so may know the identifier already.
+  // libxml2 handles xml:id itself, and so may have registered the identifier already.
   const bool isKnown = attribute.atype == XML_ATTRIBUTE_ID;
   if (!identifiers.emplace(value, &element).second ||
       (!isKnown && !xmlAddID(nullptr, element.doc, XmlText(value.c_str()), &attribute))) {
-    throw Refusal(Code::INVALID_SECURITY, "the identifier '" + value + "' stands twice");
+    throw Refusal(Code::INVALID_SECURITY, "the identifier '" + value + "' occurs twice");
   }
 }
 
@@ -144,7 +144,7 @@ std::string TextOf(const xmlNode &element) {
   std::string text;
   for (const xmlNode *child = element.children; child; child = child->next) {
     if (child->type != XML_TEXT_NODE && child->type != XML_CDATA_SECTION_NODE) {
-      throw Refusal(Code::INVALID_REQUEST, ToString(element.name) + " must hold text alone");
+      throw Refusal(Code::INVALID_REQUEST, ToString(element.name) + " must contain only text");
     }
     text += ToString(child->content);
   }

@@ -26,7 +26,7 @@ inline const xmlChar *XmlText(const char *text) {
   return reinterpret_cast<const xmlChar *>(text);
 }
 
-/// A message from the network: no DOCTYPE, no entities but the predefined ones, nothing fetched, at most 256 levels.
+/// Parses a message from the network: no DOCTYPE, only the predefined entities, nothing is fetched, at most 256 levels.
 /// @throws Refusal (soapenv:Client)
 Document ParseMessage(std::string_view xml);
 
@@ -35,13 +35,13 @@ bool IsElement(const xmlNode &node, const Namespace &ns, std::string_view name);
 /// The children that are elements, in document order.
 std::vector<xmlNode *> ChildElements(const xmlNode &parent);
 
-/// The child of that name, null for none. @throws Refusal (wst:InvalidRequest) when there are several
+/// The child of that name; null when there is none. @throws Refusal (wst:InvalidRequest) when there are several
 xmlNode *FindChild(const xmlNode &parent, const Namespace &ns, std::string_view name);
 
 /// The child of that name. @throws Refusal (wst:InvalidRequest) when there is not exactly one
 xmlNode &RequireChild(const xmlNode &parent, const Namespace &ns, std::string_view name);
 
-/// The text of an element that holds nothing but text. @throws Refusal (wst:InvalidRequest) when it holds anything else
+/// The text of an element that contains only text. @throws Refusal (wst:InvalidRequest) when it contains anything else
 std::string TextOf(const xmlNode &element);
 
 /// The attribute without namespace.
@@ -52,7 +52,7 @@ std::optional<std::string> AttributeOf(const xmlNode &element, const Namespace &
 using Identifiers = std::map<std::string, xmlNode *>;
 
 /// Collects the identifiers and makes them known to libxml2, and so to the signature engine.
-/// @throws Refusal (wsse:InvalidSecurity) when one stands twice, or one element has several
+/// @throws Refusal (wsse:InvalidSecurity) when one occurs twice, or when an element has several
 Identifiers RegisterIdentifiers(xmlDoc &document);
 
 /// A document whose root is a new element.
@@ -61,7 +61,7 @@ Document NewDocument(const Namespace &ns, const char *rootName);
 /// Declares the namespace on the element.
 void DeclareNamespace(xmlNode &element, const Namespace &ns);
 
-/// Appends an element, with the namespace's prefix as it is in scope, or declared on the new element.
+/// Appends an element. The namespace is declared on it when it is not in scope.
 xmlNode &AddElement(xmlNode &parent, const Namespace &ns, const char *name, std::string_view text = {});
 
 void SetAttribute(xmlNode &element, const char *name, const std::string &value);

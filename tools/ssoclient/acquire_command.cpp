@@ -36,9 +36,9 @@ ExitCode Acquire(const AcquireOptions &options, const OutputOptions &output) {
   CheckTokenOutput(options.tokenOutput, output);
 
   const Tarvel::Crypto::CertificateList trusted = LoadTrusted(options.trust, output);
-  const auto connection = CreateConnection(options.connection, trusted, LoadIdentity(options.identity));
-  const IssuedToken issued = kind.acquire({*connection.service, spec, hasIdentity, options.credentials,
-                                           options.connection.url, trusted, options.trust.toleranceSec, output});
+  const auto service = CreateService(options.connection, trusted, LoadIdentity(options.identity));
+  const IssuedToken issued = kind.acquire({*service, spec, hasIdentity, options.credentials, options.connection.url,
+                                           trusted, options.trust.toleranceSec, output});
   RequireWithinTolerance(*issued.token, trusted, options.trust.toleranceSec);
   WriteToken(issued, spec, options.trust.toleranceSec, options.tokenOutput, output);
   return ExitCode::DONE;

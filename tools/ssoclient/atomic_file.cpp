@@ -23,7 +23,7 @@ namespace {
 }
 
 [[noreturn]] void ThrowExists(const std::string &path) {
-  throw Tarvel::IOException(path + ": is there already; --force replaces it");
+  throw Tarvel::IOException(path + ": already exists; --force replaces it");
 }
 
 std::string FolderOf(const std::string &path) {
@@ -31,7 +31,7 @@ std::string FolderOf(const std::string &path) {
   return slash == std::string::npos ? "." : path.substr(0, slash + 1);
 }
 
-/// A new file in a folder, which goes again unless it was published under its final name.
+/// A new file in a folder, which is deleted unless it is published under its final name.
 class TemporaryFile {
 public:
   explicit TemporaryFile(const std::string &finalPath)
@@ -45,7 +45,7 @@ public:
   TemporaryFile &operator=(const TemporaryFile &) = delete;
   ~TemporaryFile() {
     close(m_descriptor);
-    if (!m_isGone) {
+    if (!m_isPublished) {
       unlink(m_path.c_str());
     }
   }
@@ -67,10 +67,10 @@ public:
     if (std::rename(m_path.c_str(), m_finalPath.c_str()) != 0) {
       ThrowSystemError(m_finalPath, errno);
     }
-    m_isGone = true;
+    m_isPublished = true;
   }
 
-  // A link, unlike a renamed file, never takes the place of a file that came meanwhile.
+  // Unlike a renamed file, a link never replaces a file that has been created in the meantime.
   void PublishAsNew() {
     if (link(m_path.c_str(), m_finalPath.c_str()) == 0) {
       return;
@@ -85,7 +85,7 @@ private:
   std::string m_finalPath;
   std::string m_path;
   int m_descriptor;
-  bool m_isGone = false;
+  bool m_isPublished = false;
 };
 
 } // namespace
@@ -93,9 +93,9 @@ private:
 void RequireWritableFile(const std::string &path, bool replace) {
   struct stat status = {};
   if (lstat(path.c_str(), &status) == 0) {
-    // A device, or the target of a symbolic link, is not what a caller means to replace by a token.
+    // A caller does not mean to replace a device, or the target of a symbolic link, with a token.
     if (!S_ISREG(status.st_mode)) {
-      throw Tarvel::IOException(path + ": is no regular file");
+      throw Tarvel::IOException(path + ": is not a regular file");
     }
     if (!replace) {
       ThrowExists(path);

@@ -9,13 +9,13 @@
 
 namespace SsoClient::Tool {
 
-/// Refuses, before any work is done for it, a file that `WriteFileWhole` would refuse.
-/// @throws Tarvel::IOException when there is such a file and `replace` is not set, when what is there is no regular file,
+/// Checks, before any work is done for the file, that `WriteFileWhole` would not refuse it.
+/// @throws Tarvel::IOException when the file exists and `replace` is not set, when it exists and is not a regular file,
 ///         and when its folder cannot be written to.
 void RequireWritableFile(const std::string &path, bool replace);
 
-/// Makes `path` a file of mode 0600 that holds `content`. At every moment there is either what was there before, or the
-/// whole content; also when the process is told to end meanwhile. A file that is there already is an error unless
+/// Makes `path` a file of mode 0600 that holds `content`. At every moment, `path` is as it was before, or it holds the
+/// whole content; that is also true when a signal ends the process. A file that already exists is an error unless
 /// `replace` is set. Main thread only.
 /// @throws Tarvel::IOException naming the path.
 void WriteFileWhole(const std::string &path, std::string_view content, bool replace);

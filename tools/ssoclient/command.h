@@ -15,16 +15,15 @@ class App;
 
 namespace SsoClient::Tool {
 
-/// What a command does once its command line is read. Failures leave it as exceptions; the exit code that it returns is
-/// its answer.
+/// Runs a command whose command line has been read. Returns the exit code; a failure is an exception.
 using Action = std::function<ExitCode()>;
 
 struct Command {
   const char *name;
   const char *summary;
-  const char *examples; ///< command lines, one a line, for the end of the help
+  const char *examples; ///< command lines, shown at the end of the help
 
-  /// Adds the command's own options to `app`; the action reads what they hold. `output` outlives both.
+  /// Adds the command's own options to `app`, and returns the action, which uses their values. `output` outlives both.
   Action (*define)(CLI::App &app, const OutputOptions &output);
 };
 

@@ -6,7 +6,9 @@
 #include "option.h"
 
 #include <ssoclient/security_token_service_config.h>
+#include <tarvel/core/ref.h>
 #include <tarvel/http/url.h>
+#include <tarvel/ssl/ssl_context.h>
 
 #include <cstddef>
 
@@ -21,7 +23,7 @@ bool IsHexDigit(char c) {
   return (c >= '0' && c <= '9') || (c >= 'a' && c <= 'f') || (c >= 'A' && c <= 'F');
 }
 
-/// Whether the handshake will take `text` for a thumbprint: it has a colon after every two digits, or none.
+/// Whether the handshake accepts `text` as a thumbprint: it has a colon after every two digits, or none.
 bool IsThumbprint(const std::string &text) {
   const bool hasColons = text.size() == THUMBPRINT_WITH_COLONS;
   if (!hasColons && text.size() != THUMBPRINT_DIGITS) {
@@ -49,16 +51,19 @@ bool IsSecure(const std::string &url) {
 
 void AddConnectionOptions(CLI::App &app, ConnectionOptions &options) {
   AddOption(app, "--sts", options.url, "Address of the token service").Required().TypeName("URL").Group(GROUP);
-  const Option ca = AddOption(app, "--ca", options.caFile,
-                              "File with the authorities that may vouch for the server, PEM; without it, the system's")
-                        .TypeName("FILE")
-                        .Group(GROUP);
+  const Option ca =
+      AddOption(
+          app, "--ca", options.caFile,
+          "PEM file of the authorities that may issue the server's certificate; by default, the system's trust store")
+          .TypeName("FILE")
+          .Group(GROUP);
   AddOption(app, "--thumbprint", options.thumbprint,
-            "SHA-256 of the server's certificate, which then needs no authority")
+            "SHA-256 digest of the server's certificate; checked in place of its issuer and name")
       .TypeName("HEX")
       .Group(GROUP)
       .Excludes(ca);
-  AddFlag(app, "--allow-http", options.allowHttp, "Let passwords and tokens travel unprotected, to an http address")
+  AddFlag(app, "--allow-http", options.allowHttp,
+          "Permit an http address, which sends passwords and tokens unencrypted")
       .Group(GROUP);
 }
 
@@ -72,32 +77,32 @@ void CheckConnection(const ConnectionOptions &options) {
     return;
   }
   if (!options.allowHttp) {
-    throw UsageException("--sts is a plain http address, on which everybody can read along; --allow-http permits it");
+    throw UsageException("--sts is a plain http address, which is not encrypted; --allow-http permits it");
   }
   if (!options.caFile.empty() || !options.thumbprint.empty()) {
     throw UsageException("--ca and --thumbprint protect nothing on a plain http address");
   }
 }
 
-Connection CreateConnection(const ConnectionOptions &options, const Tarvel::Crypto::CertificateList &trusted,
-                            const boost::optional<HolderOfKeyConfig> &identity) {
-  Connection connection;
+std::shared_ptr<SecurityTokenService> CreateService(const ConnectionOptions &options,
+                                                    const Tarvel::Crypto::CertificateList &trusted,
+                                                    const boost::optional<HolderOfKeyConfig> &identity) {
   SecurityTokenServiceConfig config;
   config.stsUrl = options.url;
   config.signingCertificates = trusted;
   config.sslParameter = options.thumbprint;
   config.holderOfKeyConfig = identity;
+  Tarvel::Ref<Tarvel::Ssl::SSLContext> context;
   if (IsSecure(options.url)) {
-    connection.context = Tarvel::Ssl::CreateSSLContext();
+    context = Tarvel::Ssl::CreateSSLContext();
     if (!options.caFile.empty()) {
-      connection.context->TrustFile(options.caFile);
+      context->TrustFile(options.caFile);
     } else if (options.thumbprint.empty()) {
-      connection.context->TrustSystemStore();
+      context->TrustSystemStore();
     }
-    config.sslContext = connection.context.get();
   }
-  connection.service = CreateSecurityTokenService(config);
-  return connection;
+  config.sslContext = context.get();         // null for plain http
+  return CreateSecurityTokenService(config); // which takes a reference of its own to the context
 }
 
 } // namespace SsoClient::Tool

@@ -11,15 +11,15 @@ namespace {
 constexpr const char *GROUP = "Credentials";
 
 constexpr Doubt DELEGATION_WITHOUT_PROOF = {
-    "with --delegate-to, a token is asked for that is bound to the identity's key, but without proof of the key, which "
-    "services refuse",
-    "give --bearer, too: with --user or --gss, a token for --delegate-to cannot be bound to a key"};
+    "with --delegate-to, the request asks for a token that is bound to the identity's key, but does not prove the key; "
+    "services refuse that",
+    "also give --bearer: with --user or --gss, a token for --delegate-to cannot be bound to a key"};
 
 constexpr Doubt EXCHANGE_OF_BEARER_TOKEN = {
-    "the token to exchange is a bearer token, whose exchange services refuse",
+    "the token to exchange is a bearer token; services refuse to exchange those",
     "an exchange needs a holder-of-key token; acquire one with the identity, and without --bearer"};
 
-/// The request for a delegated token is not signed, whatever kind of token it asks for.
+/// A request for a delegated token is not signed, even when it asks for a token that is bound to a key.
 const Doubt *DoubtAboutDelegation(const AcquireCall &call) {
   const bool asksForBoundToken = call.hasIdentity && call.spec.confirmation == TokenSpec::CONFIRMATION_DEFAULT;
   return asksForBoundToken && call.spec.delegateTo ? &DELEGATION_WITHOUT_PROOF : nullptr;
@@ -29,7 +29,7 @@ void CheckNothing(const TokenSpec &, bool) {}
 
 IssuedToken AcquireByPassword(const AcquireCall &call) {
   const CredentialsOptions &credentials = call.credentials;
-  const Secret password = ReadSecret(credentials.password, "Password for " + credentials.user + ": ");
+  const Tarvel::SecretText password = ReadSecret(credentials.password, "Password for " + credentials.user + ": ");
   return AskForToken([&] { return call.service.AcquireToken(credentials.user, password.Get(), call.spec); },
                      DoubtAboutDelegation(call), call.output);
 }
@@ -42,7 +42,7 @@ void CheckExchange(const TokenSpec &, bool hasIdentity) {
 
 IssuedToken AcquireByToken(const AcquireCall &call) {
   const auto given = ReadToken(call.credentials.tokenFile, call.trusted, call.toleranceSec);
-  // The request's signature names the token for its key, and a bearer token has none.
+  // The signature of the request refers to the token for its key, and a bearer token has no key.
   const Doubt *const doubt = given->GetConfirmationMethod() == SamlToken::BEARER ? &EXCHANGE_OF_BEARER_TOKEN : nullptr;
   return AskForToken([&] { return call.service.AcquireTokenByToken(*given, call.spec); }, doubt, call.output);
 }
@@ -58,7 +58,7 @@ IssuedToken AcquireByTicket(const AcquireCall &call) {
 
 void CheckCertificate(const TokenSpec &spec, bool) {
   if (spec.confirmation != TokenSpec::CONFIRMATION_DEFAULT) {
-    throw UsageException("--bearer does not go with an identity alone, whose token is bound to its key");
+    throw UsageException("--bearer cannot be combined with an identity alone, whose token is bound to its key");
   }
 }
 
@@ -88,17 +88,19 @@ void AddGssOptions(CLI::App &app, GssOptions &options) {
   const Option gss =
       AddFlag(app, "--gss", options.isChosen, "Acquire by a Kerberos ticket, negotiated through the GSSAPI")
           .Group(GROUP);
-  AddOption(app, "--service", options.service,
-            "The token service's principal, as HTTP@host or HTTP/host@REALM; without it, HTTP at the address's host")
+  AddOption(
+      app, "--service", options.service,
+      "The token service's principal, such as HTTP@host or HTTP/host@REALM; by default, HTTP@ and the host of --sts")
       .TypeName("PRINCIPAL")
       .Group(GROUP)
       .Needs(gss);
-  AddOption(app, "--ccache", options.credentialCache, "Credential cache with the ticket; without it, the default one")
+  AddOption(app, "--ccache", options.credentialCache,
+            "Credential cache with the ticket; by default, the Kerberos library's")
       .TypeName("NAME")
       .Group(GROUP)
       .Needs(gss);
   AddOption(app, "--client-keytab", options.clientKeytab,
-            "Keytab to get a ticket with, which is kept only in the cache that --ccache names")
+            "Keytab to get a ticket with; the ticket is kept only when --ccache is given")
       .TypeName("FILE")
       .Group(GROUP)
       .Needs(gss);
@@ -108,12 +110,12 @@ void AddGssOptions(CLI::App &app, GssOptions &options) {
 
 void AddCredentialsOptions(CLI::App &app, CredentialsOptions &options) {
   const Option user =
-      AddOption(app, "--user", options.user, "Acquire by password, as this user").TypeName("NAME").Group(GROUP);
+      AddOption(app, "--user", options.user, "Acquire by password, for this user").TypeName("NAME").Group(GROUP);
   for (const Option &source : AddSecretOptions(app, options.password, GROUP)) {
     source.Needs(user);
   }
   AddOption(app, "--token", options.tokenFile,
-            "Acquire in exchange for this token, an XML file; \"-\" is standard input; needs an identity")
+            "Acquire in exchange for this token (an XML file, or \"-\" for standard input); needs an identity")
       .TypeName("FILE")
       .Group(GROUP);
   AddGssOptions(app, options.gss);

@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// The kinds of credentials that a token can be acquired with.
+/// The kinds of credentials that a token can be acquired by.
 
 #pragma once
 
@@ -29,7 +29,7 @@ struct CredentialsOptions {
   GssOptions gss;
 };
 
-/// Everything that acquiring a token takes, whatever the kind.
+/// What it takes to acquire a token, for every kind of credentials.
 struct AcquireCall {
   const SecurityTokenService &service;
   const TokenSpec &spec;
@@ -43,13 +43,13 @@ struct AcquireCall {
 
 /// One row of the table of kinds.
 struct CredentialsKind {
-  const char *option; ///< the option that chooses the kind; null for the identity alone, which needs no choosing
+  const char *option; ///< the option that chooses the kind; null for the identity alone, which has no such option
   bool (*isChosen)(const CredentialsOptions &credentials);
 
-  /// @throws UsageException when the rest of the command line does not suit the kind.
+  /// @throws UsageException when the rest of the command line contradicts the kind.
   void (*check)(const TokenSpec &spec, bool hasIdentity);
 
-  /// Reads what the kind needs, and asks the service.
+  /// Reads what the kind needs, and calls the service.
   IssuedToken (*acquire)(const AcquireCall &call);
 };
 
@@ -58,8 +58,8 @@ void AddCredentialsOptions(CLI::App &app, CredentialsOptions &options);
 /// @throws UsageException when another option reads the same descriptor.
 void ClaimInput(const CredentialsOptions &options, InputClaims &claims);
 
-/// The kind that the command line chooses; without a choice, the identity when there is one.
-/// @throws UsageException when it chooses none or several.
+/// The kind that the command line chooses, or the identity alone when it chooses none.
+/// @throws UsageException when it chooses several, or none and there is no identity.
 const CredentialsKind &ChooseCredentials(const CredentialsOptions &options, bool hasIdentity);
 
 } // namespace SsoClient::Tool

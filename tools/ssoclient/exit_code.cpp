@@ -47,7 +47,7 @@ struct Row {
   Failure failure;
 };
 
-// The first row that matches counts, so a class stands above its base.
+// The first matching row counts, so a class precedes its base.
 constexpr Row TABLE[] = {
     {IsA<UsageException>, {ExitCode::USAGE, "UsageException", "usage"}},
 #ifdef SSOCLIENT_TOOL_HAS_GSSAPI
@@ -72,7 +72,7 @@ constexpr Row TABLE[] = {
     {IsA<Tarvel::Crypto::KeyMismatchException>, {ExitCode::FILE_OR_KEY, "KeyMismatchException", "key"}},
     {IsA<Tarvel::Crypto::CryptoException>, {ExitCode::FILE_OR_KEY, "CryptoException", "key or certificate"}},
     {IsA<SsoException>, {ExitCode::SERVICE_FAULT, "SsoException", "service fault"}},
-    // All arguments of the library come from the command line: an address, a name that XML cannot carry.
+    // Every argument of the library is from the command line, such as an address, or a name that XML cannot represent.
     {IsA<Tarvel::Http::MalformedURLException>, {ExitCode::USAGE, "MalformedURLException", "usage"}},
     {IsA<Tarvel::InvalidArgumentException>, {ExitCode::USAGE, "InvalidArgumentException", "usage"}},
     {IsA<Tarvel::OutOfMemoryException>, {ExitCode::UNEXPECTED, "OutOfMemoryException", "out of memory"}},

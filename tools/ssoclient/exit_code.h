@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// The exit codes of the tool and which failure ends in which.
+/// The exit codes of the tool, and which failure has which.
 
 #pragma once
 
@@ -33,17 +33,17 @@ public:
   using std::runtime_error::runtime_error;
 };
 
-/// What a failure means to whoever called the tool.
+/// How the tool reports a failure.
 struct Failure {
   ExitCode code;
   std::string_view className; ///< the unqualified name of the exception's class
-  std::string_view label;     ///< begins the line that tells a person of it
+  std::string_view label;     ///< begins the line that reports the failure in text
 };
 
 /// Looks `failure` up in the one table of failures.
 Failure Classify(const std::exception &failure) noexcept;
 
-/// A failure with what its text does not say: what the caller may do about it. It means what the failure means.
+/// A failure together with a hint: what the caller may do about it. It is reported as that failure is.
 class HintedException : public std::runtime_error {
 public:
   HintedException(const std::exception &failure, const std::string &hint)

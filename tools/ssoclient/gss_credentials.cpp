@@ -8,7 +8,7 @@
 namespace SsoClient::Tool {
 namespace {
 
-/// The principal that web services have by custom (RFC 4559).
+/// The principal that web services have by convention (RFC 4559).
 std::string UsualService(const std::string &url) {
   bool isSecure = false;
   std::string host;

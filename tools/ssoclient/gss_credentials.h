@@ -15,8 +15,8 @@ namespace SsoClient::Tool {
 
 struct GssOptions {
   bool isChosen = false;
-  std::string service;         ///< empty: HTTP at the host of the token service's address
-  std::string credentialCache; ///< empty: the default one, or, beside a keytab, none
+  std::string service;         ///< empty: HTTP@ and the host of the token service's address
+  std::string credentialCache; ///< empty: the default one, or none when there is a keytab
   std::string clientKeytab;    ///< empty: none
 };
 

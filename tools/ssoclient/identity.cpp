@@ -34,7 +34,7 @@ HolderOfKeyConfig LoadPair(const IdentityOptions &options) {
 
 void AddIdentityOptions(CLI::App &app, IdentityOptions &options) {
   const Option certificate =
-      AddOption(app, "--cert", options.certificateFile, "Certificate of the key, PEM or DER; the first of a chain")
+      AddOption(app, "--cert", options.certificateFile, "Certificate of the key, PEM or DER; of a chain, the first")
           .TypeName("FILE")
           .Group(GROUP);
   const Option key = AddOption(app, "--key", options.key, "Private key that signs requests, a file or a key URI")

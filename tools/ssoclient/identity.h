@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// The key and certificate that sign a command's requests, and that holder-of-key tokens are bound to.
+/// The key and certificate that sign a command's requests. Holder-of-key tokens are bound to that key.
 
 #pragma once
 
@@ -21,7 +21,7 @@ namespace SsoClient::Tool {
 
 struct IdentityOptions {
   std::string certificateFile;
-  std::string key; ///< a file or the URI of a key
+  std::string key; ///< a file or a key URI
   std::string p12File;
   SecretOptions passphrase{"passphrase", {}, -1};
 
@@ -30,11 +30,11 @@ struct IdentityOptions {
 
 void AddIdentityOptions(CLI::App &app, IdentityOptions &options);
 
-/// @throws UsageException for a passphrase without a key, or when somebody else reads the same descriptor.
+/// @throws UsageException for a passphrase without a key, or when another option reads the same descriptor.
 void CheckIdentity(const IdentityOptions &options, InputClaims &claims);
 
-/// The identity, or none. The passphrase is read only if the key needs one.
-/// @throws Tarvel::IOException, Tarvel::Crypto::CryptoException, UsageException (as `ReadSecret` says)
+/// The identity; none when no option gives one. The passphrase is read only if the key needs it.
+/// @throws Tarvel::IOException, Tarvel::Crypto::CryptoException, and what `ReadSecret` throws
 boost::optional<HolderOfKeyConfig> LoadIdentity(const IdentityOptions &options);
 
 } // namespace SsoClient::Tool

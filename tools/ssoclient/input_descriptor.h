@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// Descriptors that the tool reads from, and the rule that one is read for one purpose.
+/// Descriptors that the tool reads from, and the rule that each is read for one purpose only.
 
 #pragma once
 
@@ -9,7 +9,7 @@
 
 namespace SsoClient::Tool {
 
-/// A descriptor that is closed at the end, unless it is standard input.
+/// Owns a descriptor and closes it, unless it is standard input.
 class InputDescriptor {
 public:
   /// Opens the file `path`; "-" is standard input. @throws Tarvel::IOException naming the path.
@@ -26,12 +26,12 @@ private:
   int m_descriptor;
 };
 
-/// Which option of a command line reads which descriptor that the process was started with.
+/// Records which option reads which of the descriptors that the process was started with.
 class InputClaims {
 public:
-  /// `option` reads the file `path`, which counts when it is "-". @throws UsageException when another one reads it, too.
+  /// `option` reads the file `path`; only "-" is a claim. @throws UsageException when another option reads it too.
   void ClaimFile(const std::string &path, const std::string &option);
-  /// `option` reads `descriptor`, unless that is negative. @throws UsageException when another one reads it, too.
+  /// `option` reads `descriptor`, unless that is negative. @throws UsageException when another option reads it too.
   void ClaimDescriptor(int descriptor, const std::string &option);
 
 private:

@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// `ssoclient inspect`: tells what a token says, and that nobody checked it.
+/// `ssoclient inspect`: shows what a token says, and that it was not checked.
 
 #include "command.h"
 #include "token_report.h"
@@ -17,7 +17,7 @@ Action DefineInspect(CLI::App &app, const OutputOptions &output) {
   const auto file = std::make_shared<std::string>();
   AddTokenArgument(app, *file);
   return [file, &output] {
-    // One octet more than the parser takes, so that the parser is the one to refuse it.
+    // One octet more than the parser accepts, so that the parser refuses what is too long.
     WriteOutput(Render(InspectToken(ReadInput(*file, Tarvel::Xml::MAX_DOCUMENT_BYTES + 1)), output.format));
     return ExitCode::DONE;
   };

@@ -12,7 +12,7 @@ namespace {
 
 constexpr int ENDING_SIGNALS[] = {SIGINT, SIGTERM, SIGHUP, SIGQUIT};
 
-// What the handler puts back. It runs on the main thread alone, which changes these with signals held back.
+// What the handler restores. It runs only on the main thread, which changes these variables with signals blocked.
 volatile std::sig_atomic_t g_isQuiet = 0;
 int g_terminal = -1;
 termios g_earlierSettings;
@@ -20,7 +20,7 @@ termios g_earlierSettings;
 void RestoreTerminal() noexcept {
   if (g_isQuiet) {
     g_isQuiet = 0;
-    // What was typed so far is dropped: the rest of a password must not reach whoever reads the terminal next.
+    // Drops what has been typed so far: the program that next reads the terminal must not get the rest of a password.
     tcsetattr(g_terminal, TCSAFLUSH, &g_earlierSettings);
   }
 }
@@ -30,7 +30,7 @@ extern "C" void EndAtSignal(int signal) {
   if (signal == SIGINT) {
     _exit(static_cast<int>(ExitCode::INTERRUPTED));
   }
-  // The handler was reset when it was called, so this ends the process as if there had been none.
+  // The handler was reset when it was called, so this ends the process as if there were no handler.
   raise(signal);
 }
 
@@ -49,7 +49,7 @@ sigset_t EndingAndStopping() noexcept {
 void CatchEndingSignals() {
   for (const int signal : ENDING_SIGNALS) {
     struct sigaction previous = {};
-    // A shell starts background work with SIGINT ignored, and it must stay so.
+    // A shell starts background jobs with SIGINT ignored; it must stay ignored.
     if (sigaction(signal, nullptr, &previous) == 0 && previous.sa_handler != SIG_IGN) {
       struct sigaction action = {};
       action.sa_handler = EndAtSignal;
@@ -57,7 +57,7 @@ void CatchEndingSignals() {
       sigaction(signal, &action, nullptr);
     }
   }
-  // A file that grows beyond the limit of the process is an error of writing, which is cleaned up after.
+  // Ignored so that a file beyond the process's size limit is a write error, after which the file is cleaned up.
   std::signal(SIGXFSZ, SIG_IGN);
 }
 

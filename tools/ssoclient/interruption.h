@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// How the tool ends when it is told to: at once, with the terminal as it was and nothing half done left behind.
+/// How a signal ends the tool: at once, with the terminal as it was, and with no unfinished file left over.
 
 #pragma once
 
@@ -10,13 +10,13 @@
 
 namespace SsoClient::Tool {
 
-/// From now on an interrupt (SIGINT) ends the process with `ExitCode::INTERRUPTED`, and SIGTERM, SIGHUP and SIGQUIT end it
-/// as they always do; before either, a terminal that was made quiet echoes again. A signal that is ignored stays so. To be
-/// called on the main thread, which stays the only one that takes signals: the library's own threads hold them all back.
+/// From now on an interrupt (SIGINT) ends the process with `ExitCode::INTERRUPTED`, and SIGTERM, SIGHUP and SIGQUIT end
+/// it as they always do; in each case a quiet terminal echoes again first. A signal that is ignored stays ignored. Call
+/// it on the main thread, which handles all signals: the library's own threads block them.
 void CatchEndingSignals();
 
-/// Holds back, while it lives, the signals that end or stop the process; one that comes meanwhile takes effect afterwards.
-/// For work that is short and must not stay half done. Main thread only.
+/// Blocks, while it lives, the signals that end or stop the process; a signal that arrives takes effect afterwards. For
+/// short work that must not be left half done. Main thread only.
 class SignalsHeldBack {
 public:
   SignalsHeldBack() noexcept;
@@ -28,9 +28,9 @@ private:
   sigset_t m_earlier;
 };
 
-/// Keeps the terminal at a descriptor, if it is one, from echoing what is typed; the end of the line still shows. The
-/// process cannot be stopped by the keyboard meanwhile, since the shell would make the terminal echo again. At most one at
-/// a time; main thread only.
+/// While it lives, the terminal at a descriptor (if it is a terminal) does not echo what is typed, except the end of
+/// the line. The keyboard cannot stop the process, since the shell would then make the terminal echo again. At most one
+/// at a time; main thread only.
 class QuietTerminal {
 public:
   explicit QuietTerminal(int descriptor) noexcept;

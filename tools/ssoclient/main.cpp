@@ -25,8 +25,8 @@ namespace {
 
 constexpr Command COMMANDS[] = {
     {"acquire",
-     "Ask the service for a token: by password, in exchange for a token, by a Kerberos ticket, or by an "
-     "identity",
+     "Ask the service for a token: by password, by an identity, by a Kerberos ticket, or in exchange for a "
+     "token",
      "  ssoclient acquire --sts https://sts.corp.example/sts --ca ca.pem --trust sts.pem --user alice@corp.example\n"
      "  ssoclient acquire --sts https://sts.corp.example/sts --ca ca.pem --trust sts.pem \\\n"
      "      --user alice@corp.example --password-file password.txt --out alice.xml\n"
@@ -38,14 +38,14 @@ constexpr Command COMMANDS[] = {
      "  ssoclient acquire --sts https://sts.corp.example/sts --ca ca.pem --trust sts.pem \\\n"
      "      --gss --service HTTP/sts.corp.example@CORP.EXAMPLE --client-keytab robot.keytab\n",
      DefineAcquire},
-    {"renew", "Ask the service for a new token in place of a renewable one",
+    {"renew", "Ask the service for a new token to replace a renewable one",
      "  ssoclient renew --sts https://sts.corp.example/sts --ca ca.pem --trust sts.pem \\\n"
      "      --cert client.pem --key client.key --lifetime 1d --out client.xml --force client.xml\n",
      DefineRenew},
-    {"validate", "Ask the service whether it holds a token to be valid",
+    {"validate", "Ask the service whether a token is valid",
      "  ssoclient validate --sts https://sts.corp.example/sts --ca ca.pem --trust sts.pem client.xml\n",
      DefineValidate},
-    {"verify", "Check a token as a relying service does, and show what is in it",
+    {"verify", "Check a token as a relying service does, and show what it says",
      "  ssoclient verify --trust sts.pem token.xml\n"
      "  ssoclient verify --trust sts.pem --trust next-sts.pem --tolerance 60 --format json - <token.xml\n",
      DefineVerify},
@@ -55,7 +55,7 @@ constexpr Command COMMANDS[] = {
      DefineInspect},
 };
 
-/// The format that the command line asks for, also when it cannot be read as a whole.
+/// The format that the command line asks for; works also for a command line that has errors.
 Format RequestedFormat(int argc, char **argv) {
   for (int i = 1; i < argc; ++i) {
     const std::string_view argument = argv[i];
@@ -72,8 +72,8 @@ bool HasEmptyValue(const std::string &argument) {
   return argument.size() > 3 && argument.compare(0, 2, "--") == 0 && argument.find('=') == argument.size() - 1;
 }
 
-/// The arguments of the process as the parser wants them: the last one first. "--name=" is taken apart, for the parser would
-/// drop the empty text, and take the next argument in its place.
+/// The arguments of the process in the order that the parser expects: the last one first. "--name=" becomes "--name"
+/// and an empty argument, since the parser would drop the empty text and use the next argument instead.
 std::vector<std::string> ReadArguments(int argc, char **argv) {
   std::vector<std::string> arguments;
   bool mayBeOption = true;
@@ -97,13 +97,13 @@ bool IsOption(const std::string &argument) {
   return argument.size() > 1 && argument.front() == '-';
 }
 
-/// The name of the option in `argument`. What is joined to it is left out, for it may be a secret.
+/// The name of the option in `argument`, without an attached value, which may be a secret.
 std::string OptionName(const std::string &argument) {
   return argument.compare(0, 2, "--") == 0 ? argument.substr(0, argument.find('=')) : argument.substr(0, 2);
 }
 
-/// What the command line has no place for: the first unknown option, or else an argument. What follows the option, and
-/// the argument itself, are left out: somebody may have tried to give a secret there.
+/// Describes what the command line should not have: the first unknown option, or else an argument. The argument itself,
+/// and the option's, are left out, since somebody may have tried to give a secret there.
 std::string DescribeExtras(const std::vector<std::string> &extras) {
   const auto option = std::find_if(extras.begin(), extras.end(), IsOption);
   return option == extras.end() ? "too many arguments" : "not expected: " + OptionName(*option);
@@ -130,13 +130,13 @@ void AddOutputOptions(CLI::App &app, OutputOptions &output) {
       {"text", Format::TEXT}, {"json", Format::JSON}, {"xml", Format::XML}};
   app.add_option_function<std::string>(
          "--format", [&output](const std::string &name) { output.format = FORMATS.at(name); },
-         "How to write the result; xml is the token itself")
+         "Format of the result; xml is the token itself")
       ->check(RefuseEmpty)
       ->check(CLI::IsMember({"text", "json", "xml"}))
       ->default_str("text")
       ->type_name("FORMAT");
   AddFlag(app, "-v,--verbose", output.verbose,
-          "Write the library's log lines to standard error, and warnings also when the format is json");
+          "Write the library's log lines to standard error, and warnings even when the format is json");
 }
 
 int Run(int argc, char **argv) {
@@ -155,7 +155,7 @@ int Run(int argc, char **argv) {
     sub->final_callback([&chosen, action = command.define(*sub, output)] { chosen = action; });
     AddOutputOptions(*sub, output);
     sub->add_flag("--system-crypto", usesSystemCrypto,
-                  "Use OpenSSL as the machine has configured it, with its providers (FIPS, PKCS#11) and TLS settings");
+                  "Use OpenSSL as this machine configures it, with its providers (FIPS, PKCS#11) and TLS settings");
   }
 
   try {

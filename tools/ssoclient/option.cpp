@@ -10,7 +10,7 @@
 namespace SsoClient::Tool {
 namespace {
 
-/// Replaces the decimal number in `argument` by its shortest form; what is wrong with it, or nothing.
+/// Replaces the decimal number in `argument` with its shortest form. Returns what is wrong with it, or an empty text.
 std::string NormaliseNumber(std::string &argument) {
   if (argument.empty()) {
     return RefuseEmpty(argument);
@@ -28,13 +28,13 @@ std::string NormaliseNumber(std::string &argument) {
   return {};
 }
 
-/// What is wrong with the "true" that the parser stores for a flag, or with a text that was joined to the flag by "=".
+/// Accepts the "true" that the parser stores for a flag, and refuses any text that follows the flag after "=".
 std::string RefuseArgument(const std::string &argument) {
   return argument == "true" ? "" : "takes no argument";
 }
 
 Option AddNumber(CLI::Option &option) {
-  // Without this, a leading 0 would make the number octal.
+  // Without this, the parser would read a number with a leading 0 as octal.
   option.transform(CLI::Validator(NormaliseNumber, ""));
   return Option(option);
 }
@@ -100,7 +100,7 @@ Option AddOption(CLI::App &command, const std::string &name, std::int64_t &value
 
 Option AddOption(CLI::App &command, const std::string &name, std::vector<std::string> &values,
                  const std::string &help) {
-  // The arguments as they are: a conversion to a vector would take "{}" and "%%" for signs of its own.
+  // Stores the arguments unchanged: the parser's conversion to a vector gives "{}" and "%%" a special meaning.
   const auto take = [&values](const CLI::results_t &arguments) {
     values = arguments;
     return true;

@@ -34,7 +34,7 @@ struct Decoded {
   std::size_t length;
 };
 
-/// How many octets the lead octet of a UTF-8 sequence announces; 1 for every other octet.
+/// The length of the UTF-8 sequence that begins with `lead`; 1 for an octet that cannot begin one.
 std::size_t AnnouncedLength(unsigned char lead) {
   if (lead < 0xC2 || lead > 0xF4) {
     return 1;
@@ -42,8 +42,8 @@ std::size_t AnnouncedLength(unsigned char lead) {
   return lead < 0xE0 ? 2 : lead < 0xF0 ? 3 : 4;
 }
 
-/// The first code point of `text`. An octet that begins no complete sequence, as in a name that is not UTF-8, stands for
-/// itself, so that a control character behind it is seen.
+/// The first code point of `text`. An octet that does not begin a complete sequence, for example in a name that is not
+/// UTF-8, counts as one code point, so that a control character after it is found.
 Decoded DecodeFirst(std::string_view text) {
   const auto octet = [&](std::size_t i) { return static_cast<unsigned char>(text[i]); };
   const std::size_t length = AnnouncedLength(octet(0));
@@ -61,7 +61,7 @@ Decoded DecodeFirst(std::string_view text) {
 }
 
 std::string Json(const nlohmann::ordered_json &value) {
-  // A name of a file may be no UTF-8; a message must still be JSON.
+  // A file name may not be UTF-8; the message must be JSON all the same.
   return value.dump(-1, ' ', true, nlohmann::json::error_handler_t::replace);
 }
 
@@ -126,7 +126,7 @@ void Warn(std::string_view message, const OutputOptions &output) {
 
 void ShowLibraryLog() {
   Tarvel::Service::GetApp().GetRootLogger()->SetSink([](const Tarvel::Service::LogRecord &record) {
-    // The logger has cut it, but what is escaped is longer than it was.
+    // The logger has already cut the message, but escapes make it longer.
     const std::string text = Tarvel::StringUtil::Shorten(Printable(record.message), Tarvel::StringUtil::MAX_LINE_BYTES);
     const std::string line = "ssoclient: log: " + text + "\n";
     std::fputs(line.c_str(), stderr);

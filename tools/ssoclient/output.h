@@ -13,14 +13,14 @@ namespace SsoClient::Tool {
 
 enum class Format { TEXT, JSON, XML };
 
-/// What every command lets its caller choose about output.
+/// The output options that all commands share.
 struct OutputOptions {
   Format format = Format::TEXT;
   bool verbose = false;
 };
 
-/// `text` with everything that could steer a terminal, or feign lines of its own, written as \uXXXX: control
-/// characters, line and paragraph separators, and the characters that turn the direction of text. `text` is UTF-8.
+/// `text` with every character that could control a terminal or fake a line written as \uXXXX: control characters, line
+/// and paragraph separators, and characters that change the direction of text. `text` is UTF-8.
 std::string Printable(std::string_view text);
 
 /// The same, cut at the length of a value (`Tarvel::StringUtil::MAX_VALUE_BYTES`).
@@ -34,18 +34,17 @@ std::string ReadInput(const std::string &path, std::size_t limit);
 /// @throws Tarvel::IOException when it cannot be written in full.
 void WriteOutput(std::string_view text);
 
-/// One line on standard error, for what comes after the command's success.
+/// Writes a warning to standard error, as one line. For warnings that no failure can follow.
 void Warn(std::string_view message);
 
-/// The same for what a failure may follow. In JSON nothing is written unless the caller wants to see more: a program
-/// expects the failure's object there, and nothing else.
+/// The same for warnings that a failure may follow. When the format is JSON, only a verbose command writes them:
+/// programs expect standard error to hold the failure's object and nothing else.
 void Warn(std::string_view message, const OutputOptions &output);
 
-/// From now on each line that the library logs goes to standard error, as a line of its own.
+/// From now on each line that the library logs is written to standard error.
 void ShowLibraryLog();
 
-/// Reports `failure` on standard error: one line of text, and a second one for a hint, or one line of JSON when that is the
-/// format.
+/// Reports `failure` on standard error: in JSON as one line, otherwise as one line of text and a second one for a hint.
 void ReportFailure(const std::exception &failure, Format format);
 
 } // namespace SsoClient::Tool

@@ -26,7 +26,7 @@ struct RenewOptions {
 };
 
 ExitCode Renew(const RenewOptions &options, const OutputOptions &output) {
-  TokenSpec spec; // what a renewal asks for is a lifetime alone
+  TokenSpec spec; // a renewal asks only for a lifetime
   spec.tokenLifetimeSec = ParseLifetime(options.lifetime);
   if (!options.identity.IsGiven()) {
     throw UsageException("renewing needs the key that the token is bound to; give --cert and --key, or --p12");
@@ -39,9 +39,9 @@ ExitCode Renew(const RenewOptions &options, const OutputOptions &output) {
 
   const Tarvel::Crypto::CertificateList trusted = LoadTrusted(options.trust, output);
   const auto given = ReadToken(options.file, trusted, options.trust.toleranceSec);
-  const auto connection = CreateConnection(options.connection, trusted, LoadIdentity(options.identity));
+  const auto service = CreateService(options.connection, trusted, LoadIdentity(options.identity));
   const IssuedToken issued =
-      AskForToken([&] { return connection.service->RenewToken(*given, spec.tokenLifetimeSec); }, nullptr, output);
+      AskForToken([&] { return service->RenewToken(*given, spec.tokenLifetimeSec); }, nullptr, output);
   RequireWithinTolerance(*issued.token, trusted, options.trust.toleranceSec);
   WriteToken(issued, spec, options.trust.toleranceSec, options.tokenOutput, output);
   return ExitCode::DONE;

@@ -7,10 +7,11 @@
 #include "output.h"
 
 #include <tarvel/core/exception.h>
-#include <tarvel/core/secure_wipe.h>
 
 #include <cerrno>
+#include <cstddef>
 #include <cstring>
+#include <string_view>
 
 #include <fcntl.h>
 #include <unistd.h>
@@ -19,15 +20,16 @@ namespace SsoClient::Tool {
 namespace {
 
 constexpr int MAX_DESCRIPTOR = 65535;
+constexpr std::size_t MAX_SECRET_BYTES = 4096;
 
 [[noreturn]] void ThrowUnread(const std::string &place, const std::string &reason) {
   throw Tarvel::IOException(place + ": " + reason);
 }
 
-/// Reads octet by octet, so that what follows the line stays for whoever reads on.
+/// Reads octet by octet: what follows the line is left to be read by others, and no buffer keeps a copy of the secret.
 /// @throws Tarvel::IOException naming `place`.
-Secret ReadLine(int descriptor, const std::string &place, const std::string &secretName) {
-  Secret secret;
+Tarvel::SecretText ReadLine(int descriptor, const std::string &place, const std::string &secretName) {
+  Tarvel::SecretText secret;
   bool isEmpty = true;
   for (;;) {
     char octet = 0;
@@ -45,17 +47,22 @@ Secret ReadLine(int descriptor, const std::string &place, const std::string &sec
       return secret;
     }
     isEmpty = false;
-    secret.Append(octet);
+    if (secret.Get().size() == MAX_SECRET_BYTES) {
+      throw Tarvel::IOException("a password or passphrase is at most " + std::to_string(MAX_SECRET_BYTES) +
+                                " octets long");
+    }
+    secret.Append(std::string_view(&octet, 1));
   }
 }
 
 void Prompt(int terminal, const std::string &text) {
   const std::string printable = Printable(text);
-  // A terminal that is open for reading only still gives the secret.
+  // A terminal that cannot be written to can still be read.
   [[maybe_unused]] const ssize_t written = write(terminal, printable.data(), printable.size());
 }
 
-Secret ReadFrom(int descriptor, const std::string &place, const std::string &secretName, const std::string &prompt) {
+Tarvel::SecretText ReadFrom(int descriptor, const std::string &place, const std::string &secretName,
+                            const std::string &prompt) {
   const QuietTerminal quiet(descriptor);
   if (quiet.IsTerminal()) {
     Prompt(descriptor, prompt);
@@ -63,10 +70,10 @@ Secret ReadFrom(int descriptor, const std::string &place, const std::string &sec
   return ReadLine(descriptor, place, secretName);
 }
 
-Secret AskAtTerminal(const std::string &name, const std::string &prompt) {
+Tarvel::SecretText AskAtTerminal(const std::string &name, const std::string &prompt) {
   const int descriptor = open("/dev/tty", O_RDWR | O_CLOEXEC | O_NOCTTY);
   if (descriptor < 0) {
-    throw UsageException("there is no terminal to ask for the " + name + " at; give --" + name + "-file or --" + name +
+    throw UsageException("there is no terminal to prompt for the " + name + "; give --" + name + "-file or --" + name +
                          "-fd");
   }
   const InputDescriptor terminal(descriptor);
@@ -75,25 +82,14 @@ Secret AskAtTerminal(const std::string &name, const std::string &prompt) {
 
 } // namespace
 
-Secret::~Secret() {
-  Tarvel::SecureWipe(m_text);
-}
-
-void Secret::Append(char octet) {
-  if (m_text.size() == MAX_BYTES) {
-    throw Tarvel::IOException("a password or passphrase is at most " + std::to_string(MAX_BYTES) + " octets long");
-  }
-  m_text.push_back(octet);
-}
-
 std::vector<Option> AddSecretOptions(CLI::App &app, SecretOptions &options, const std::string &group) {
   const std::string name = options.name;
   const Option file = AddOption(app, "--" + name + "-file", options.file,
-                                "File with the " + name + " in its first line; \"-\" is standard input")
+                                "File whose first line is the " + name + "; \"-\" is standard input")
                           .TypeName("FILE")
                           .Group(group);
   const Option descriptor =
-      AddOption(app, "--" + name + "-fd", options.descriptor, "Open descriptor to read the " + name + " from, a line")
+      AddOption(app, "--" + name + "-fd", options.descriptor, "Open descriptor whose next line is the " + name)
           .Within(0, MAX_DESCRIPTOR)
           .TypeName("N")
           .Group(group)
@@ -106,7 +102,7 @@ void ClaimInput(const SecretOptions &options, InputClaims &claims) {
   claims.ClaimDescriptor(options.descriptor, std::string("--") + options.name + "-fd");
 }
 
-Secret ReadSecret(const SecretOptions &options, const std::string &prompt) {
+Tarvel::SecretText ReadSecret(const SecretOptions &options, const std::string &prompt) {
   if (options.descriptor >= 0) {
     return ReadFrom(options.descriptor, "descriptor " + std::to_string(options.descriptor), options.name, prompt);
   }

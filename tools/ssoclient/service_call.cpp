@@ -13,8 +13,8 @@ bool BeginsWith(const std::exception &failure, std::string_view begin) {
   return std::string_view(failure.what()).substr(0, begin.size()) == begin;
 }
 
-/// Whether the service has answered with a SOAP fault. One that is not about credentials has no class of its own; its text
-/// always begins like this.
+/// Whether the service has answered with a SOAP fault. A fault that is not about credentials has no class of its own,
+/// but its text always begins like this.
 bool IsRefusal(const SsoException &failure) {
   return dynamic_cast<const InvalidCredentialsException *>(&failure) != nullptr ||
          BeginsWith(failure, "Unexpected SOAP fault: ");

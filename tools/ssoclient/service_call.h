@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// Calling the service, and what its failures mean to whoever called the tool.
+/// Calling the service, and what a failure of the call means for the tool's caller.
 
 #pragma once
 
@@ -17,12 +17,12 @@
 
 namespace SsoClient::Tool {
 
-/// Whether a document is the reason, and not the key that signs a request.
+/// Whether the failure is about a document, and not about the key that signs a request.
 bool SaysNoCanonicalForm(const Tarvel::Xml::Security::XmlSecurityException &failure);
 
-/// What `call` returns, which asks the service and does nothing else.
-/// @throws SsoException in place of a failure to read what the service has sent, which says nothing about a token that the
-///         caller has. Everything else that `call` throws passes.
+/// Returns what `call` returns. `call` asks the service and does nothing else.
+/// @throws SsoException in place of a failure to read the service's answer, since such a failure says nothing about the
+///         caller's own token. Everything else that `call` throws is thrown unchanged.
 template <typename Call>
 auto CallService(const Call &call) {
   try {
@@ -39,10 +39,10 @@ auto CallService(const Call &call) {
   }
 }
 
-/// Why the services that are known refuse a request. It is sent all the same: the service decides.
+/// Why known services refuse a certain request. The request is sent all the same, since the service decides.
 struct Doubt {
   const char *warning;
-  const char *hint; ///< what to do when the service does refuse it
+  const char *hint; ///< what to do when the service has refused the request
 };
 
 struct IssuedToken {
@@ -51,9 +51,9 @@ struct IssuedToken {
 };
 
 /// The token that `call` gets from the service; never null.
-/// @param doubt null for none
+/// @param doubt null when there is none
 /// @throws SsoException for a response without a token.
-/// @throws HintedException when the service refuses a request that there is a doubt about, and as `CallService` does.
+/// @throws HintedException when the service refuses a doubtful request. Also throws what `CallService` throws.
 IssuedToken AskForToken(const std::function<std::shared_ptr<const SamlToken>()> &call, const Doubt *doubt,
                         const OutputOptions &output);
 

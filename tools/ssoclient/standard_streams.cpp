@@ -10,7 +10,7 @@ namespace SsoClient::Tool {
 void KeepStandardStreamsApart() noexcept {
   for (int stream = STDIN_FILENO; stream <= STDERR_FILENO; ++stream) {
     if (fcntl(stream, F_GETFD) < 0) {
-      // The lowest free descriptor, so this very one; open for what the stream is not for.
+      // `open` returns the lowest free descriptor, which is this one. It is opened in the wrong direction on purpose.
       open("/dev/null", stream == STDIN_FILENO ? O_WRONLY : O_RDONLY);
     }
   }

@@ -16,13 +16,13 @@ namespace {
 constexpr const char *GROUP = "Output";
 constexpr const char *STANDARD_OUTPUT = "-";
 
-/// Shows on standard output what the token in `file` says. If that fails, the command has still done what it was asked to
-/// do: the token is in its file.
-void ShowBeside(const std::string &file, const std::string &text) {
+/// Shows on standard output what the token in `file` says. A failure is only a warning: the command has done its work,
+/// and the token is in its file.
+void ShowToken(const std::string &file, const std::string &text) {
   try {
     WriteOutput(text);
   } catch (const Tarvel::IOException &failure) {
-    Warn(file + " is written, but not what it says: " + failure.what());
+    Warn(file + " was written, but what it says cannot be shown: " + failure.what());
   }
 }
 
@@ -30,11 +30,11 @@ void ShowBeside(const std::string &file, const std::string &text) {
 
 void AddTokenOutputOptions(CLI::App &app, TokenOutputOptions &options) {
   AddOption(app, "--out", options.file,
-            "File for the token's XML, mode 0600, written whole or not at all; \"-\" is standard output, which "
-            "then gets nothing else")
+            "File for the token's XML, mode 0600, written whole or not at all; \"-\" is standard output, to which "
+            "nothing else is then written")
       .TypeName("FILE")
       .Group(GROUP);
-  AddFlag(app, "--force", options.replace, "Replace the file that is there already").Group(GROUP);
+  AddFlag(app, "--force", options.replace, "Replace an existing file").Group(GROUP);
 }
 
 void CheckTokenOutput(const TokenOutputOptions &options, const OutputOptions &output) {
@@ -64,7 +64,7 @@ void WriteToken(const IssuedToken &issued, const TokenSpec &spec, std::int64_t t
   }
   WriteFileWhole(options.file, Render(report, Format::XML), options.replace);
   if (output.format != Format::XML) {
-    ShowBeside(options.file, Render(report, output.format));
+    ShowToken(options.file, Render(report, output.format));
   }
 }
 

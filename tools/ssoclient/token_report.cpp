@@ -38,7 +38,8 @@ Json AdviceJson(const Advice &advice) {
   return {{"source", advice.source}, {"attributes", std::move(attributes)}};
 }
 
-// The keys and their order are what callers rely on; a change to either needs a new "schema".
+// Callers rely on the keys and their order, which are therefore listed in one place; a change to either needs a new
+// "schema".
 std::string RenderJson(const TokenReport &report) {
   const TokenFacts &facts = report.facts;
   Json json = {{"schema", 1},
@@ -78,11 +79,11 @@ std::string RenderJson(const TokenReport &report) {
       json["unmet"].push_back(request.key);
     }
   }
-  // Everything beyond ASCII is escaped, so that a terminal shows the text and does not obey it.
+  // Everything but ASCII is escaped, so that the text cannot control a terminal.
   return json.dump(2, ' ', true);
 }
 
-/// Writes lines of a label and a value, the values in one column.
+/// Collects lines of a label and a value, with the values in one column.
 class Lines {
 public:
   void Add(std::string_view label, std::string_view value) {

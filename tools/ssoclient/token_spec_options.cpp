@@ -17,7 +17,7 @@ constexpr const char *GROUP = "Token";
 constexpr std::int64_t DAY_SEC = 24 * 60 * 60;
 constexpr std::int64_t MAX_LIFETIME_SEC = 100 * 366 * DAY_SEC;
 
-/// The seconds of a unit; 0 for what is none.
+/// The seconds of a unit; 0 for an unknown unit.
 std::int64_t UnitSeconds(std::string_view unit) {
   if (unit.empty() || unit == "s") {
     return 1;
@@ -31,7 +31,7 @@ struct AdviceText {
   std::string value;
 };
 
-/// Splits SOURCE:NAME=VALUE and takes the backslashes away.
+/// Splits SOURCE:NAME=VALUE and removes the backslashes.
 AdviceText SplitAdvice(const std::string &text) {
   std::string plain;
   std::size_t colon = std::string::npos;
@@ -55,7 +55,7 @@ AdviceText SplitAdvice(const std::string &text) {
   return {plain.substr(0, colon), plain.substr(colon + 1, equals - colon - 1), plain.substr(equals + 1)};
 }
 
-/// The element of `list` whose `key` is `value`, which is added when there is none.
+/// The element of `list` whose `key` is `value`; added when there is none.
 template <typename Element>
 Element &FindOrAdd(std::vector<Element> &list, std::string Element::*key, const std::string &value) {
   const auto found = std::find_if(list.begin(), list.end(), [&](const Element &e) { return e.*key == value; });
@@ -70,7 +70,7 @@ Element &FindOrAdd(std::vector<Element> &list, std::string Element::*key, const 
 } // namespace
 
 void AddLifetimeOption(CLI::App &app, std::string &lifetime) {
-  AddOption(app, "--lifetime", lifetime, "How long the token is to be valid: a number and s, m, h or d")
+  AddOption(app, "--lifetime", lifetime, "Lifetime to ask for: a number and s, m, h or d")
       .ShowDefault()
       .TypeName("TIME")
       .Group(GROUP);
@@ -78,18 +78,18 @@ void AddLifetimeOption(CLI::App &app, std::string &lifetime) {
 
 void AddTokenSpecOptions(CLI::App &app, TokenSpecOptions &options) {
   AddLifetimeOption(app, options.lifetime);
-  AddOption(app, "--audience", options.audience, "Who may accept the token; may be given again")
+  AddOption(app, "--audience", options.audience, "Who may accept the token; may be repeated")
       .TypeName("URI")
       .Group(GROUP);
-  AddOption(app, "--delegate-to", options.delegateTo, "Who is to act for the subject with the token")
+  AddOption(app, "--delegate-to", options.delegateTo, "Who may act for the subject with the token")
       .TypeName("NAME")
       .Group(GROUP);
-  AddFlag(app, "--delegable", options.delegable, "The token may be delegated").Group(GROUP);
-  AddFlag(app, "--renewable", options.renewable, "The token may be renewed").Group(GROUP);
-  AddFlag(app, "--bearer", options.bearer, "A token that is good without a key, although there is an identity")
+  AddFlag(app, "--delegable", options.delegable, "Ask for a token that may be delegated").Group(GROUP);
+  AddFlag(app, "--renewable", options.renewable, "Ask for a token that may be renewed").Group(GROUP);
+  AddFlag(app, "--bearer", options.bearer, "Ask for a bearer token, which needs no key, although there is an identity")
       .Group(GROUP);
   AddOption(app, "--advice", options.advice,
-            "Advice to put into the token; may be given again; a backslash before a colon that is part of NAME")
+            "Advice to put into the token; may be repeated; put a backslash before a colon that is part of NAME")
       .TypeName("SOURCE:NAME=VALUE")
       .Group(GROUP);
 }
@@ -101,7 +101,7 @@ std::int64_t ParseLifetime(std::string_view text) {
   const std::int64_t unit = UnitSeconds(text.substr(digits));
   // No message repeats the text: it may be a secret in the wrong place.
   if ((error != std::errc() && error != std::errc::result_out_of_range) || digits == 0 || unit == 0) {
-    throw UsageException("--lifetime must be a number and s, m, h or d, such as 8h");
+    throw UsageException("--lifetime must be a duration such as 8h (units: s, m, h, d)");
   }
   if (error == std::errc() && number <= 0) {
     throw UsageException("--lifetime must be positive");

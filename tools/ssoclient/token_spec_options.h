@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// What kind of token a command line asks for.
+/// The token that a command line asks for.
 
 #pragma once
 
@@ -23,7 +23,7 @@ constexpr const char *DEFAULT_LIFETIME = "8h";
 struct TokenSpecOptions {
   std::string lifetime = DEFAULT_LIFETIME;
   std::vector<std::string> audience;
-  std::string delegateTo; ///< empty: nobody
+  std::string delegateTo; ///< empty: no delegation
   bool delegable = false;
   bool renewable = false;
   bool bearer = false;
@@ -33,14 +33,14 @@ struct TokenSpecOptions {
 void AddLifetimeOption(CLI::App &app, std::string &lifetime);
 void AddTokenSpecOptions(CLI::App &app, TokenSpecOptions &options);
 
-/// The seconds that a text such as "8h" says: a number, and s, m, h or d, or nothing for seconds.
-/// @throws UsageException for any other text, for none, and for more than a hundred years.
+/// The seconds of a text such as "8h": a number, followed by s, m, h or d; without a unit, seconds.
+/// @throws UsageException for any other text, an empty one included, and for more than a hundred years.
 std::int64_t ParseLifetime(std::string_view text);
 
-/// The advice that texts of the form SOURCE:NAME=VALUE say. NAME begins after the last colon before the first "="; a
-/// backslash takes from the character behind it any such meaning. Values of one name, and names of one source, that stand
-/// in several texts are put together, in their order.
-/// @throws UsageException for a text that is not of the form.
+/// The advice in texts of the form SOURCE:NAME=VALUE. NAME begins after the last colon before the first "="; a
+/// backslash removes any such meaning from the character after it. Values of one name, and names of one source, are put
+/// together in their order.
+/// @throws UsageException for a text of another form.
 std::vector<Advice> ParseAdvice(const std::vector<std::string> &texts);
 
 /// @throws UsageException as above.

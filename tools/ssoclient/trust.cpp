@@ -30,10 +30,10 @@ void WarnOfDates(const Tarvel::Crypto::CertificateList &trusted, const OutputOpt
 
 void AddTrustOptions(CLI::App &app, TrustOptions &options) {
   AddOption(app, "--trust", options.files,
-            "File with certificates of the service whose keys are trusted, PEM or DER; may be given again")
+            "File of the service's certificates whose keys are trusted, PEM or DER; may be repeated")
       .Required()
       .TypeName("CERT");
-  AddOption(app, "--tolerance", options.toleranceSec, "How far this machine's clock may be off, in seconds")
+  AddOption(app, "--tolerance", options.toleranceSec, "By how many seconds this machine's clock may be wrong")
       .ShowDefault()
       .TypeName("S");
 }
@@ -54,7 +54,7 @@ Tarvel::Crypto::CertificateList LoadTrusted(const TrustOptions &options, const O
 
 std::shared_ptr<const SamlToken> ReadToken(const std::string &file, const Tarvel::Crypto::CertificateList &trusted,
                                            std::int64_t toleranceSec) {
-  // One octet more than the parser takes, so that the parser is the one to refuse it.
+  // One octet more than the parser accepts, so that the parser refuses what is too long.
   const std::string xml = ReadInput(file, Tarvel::Xml::MAX_DOCUMENT_BYTES + 1);
   return CreateSamlToken(xml, trusted, toleranceSec);
 }

@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// Which service's tokens a command accepts, and the tokens that it is given.
+/// The certificates that a command trusts, and the tokens that it is given.
 
 #pragma once
 
@@ -31,7 +31,7 @@ void AddTrustOptions(CLI::App &app, TrustOptions &options);
 /// Adds the argument FILE, a token.
 void AddTokenArgument(CLI::App &app, std::string &file);
 
-/// The certificates of all trust files; warns of those that are out of date.
+/// The certificates of all trust files. Warns of those that are out of date.
 /// @throws Tarvel::IOException, Tarvel::Crypto::CryptoException
 Tarvel::Crypto::CertificateList LoadTrusted(const TrustOptions &options, const OutputOptions &output);
 
@@ -40,7 +40,8 @@ Tarvel::Crypto::CertificateList LoadTrusted(const TrustOptions &options, const O
 std::shared_ptr<const SamlToken> ReadToken(const std::string &file, const Tarvel::Crypto::CertificateList &trusted,
                                            std::int64_t toleranceSec);
 
-/// Checks a token that the library accepted with `DEFAULT_CLOCK_TOLERANCE_SEC` again, when `toleranceSec` is less.
+/// Checks again, with `toleranceSec`, a token that the library has accepted with `DEFAULT_CLOCK_TOLERANCE_SEC`; does
+/// nothing unless `toleranceSec` is less.
 /// @throws ParseException
 void RequireWithinTolerance(const SamlToken &token, const Tarvel::Crypto::CertificateList &trusted,
                             std::int64_t toleranceSec);

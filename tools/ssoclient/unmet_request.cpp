@@ -11,7 +11,7 @@ namespace {
 
 using Tarvel::System::MICROSECONDS_PER_SECOND;
 
-// A service may write both instants of a token in whole seconds, each of them rounded to the token's disadvantage.
+// A service may round both dates of a token to whole seconds, each time so that the token is valid for less time.
 constexpr std::int64_t ROUNDING_SEC = 2;
 
 template <typename Texts>
@@ -23,8 +23,8 @@ std::string Join(const Texts &texts) {
   return joined;
 }
 
-/// Whether `name` means `delegate`. A name without a domain means that name in any domain.
-bool Means(const std::string &name, const PrincipalId &delegate) {
+/// Whether `name` refers to `delegate`. A name without a domain matches that name in any domain.
+bool RefersTo(const std::string &name, const PrincipalId &delegate) {
   const std::size_t at = name.rfind('@');
   if (at == std::string::npos) {
     return PrincipalId{name, delegate.domain} == delegate;
@@ -39,7 +39,7 @@ void CheckDelegation(const TokenSpec &spec, const TokenFacts &facts, std::vector
   std::string actual = "not delegated";
   if (!facts.delegationChain.empty()) {
     const PrincipalId &last = facts.delegationChain.back().subject;
-    if (Means(*spec.delegateTo, last)) {
+    if (RefersTo(*spec.delegateTo, last)) {
       return;
     }
     actual = "delegated to " + last.name + "@" + last.domain;
@@ -81,9 +81,9 @@ void CheckAudience(const TokenSpec &spec, const TokenFacts &facts, std::vector<U
   }
 }
 
-/// Whether the token lasts as long as was asked for. A service may reckon from its own clock or from the request's dates, so
-/// it is enough when the token ends late enough by this machine's clock, or when it lasts long enough by its own dates and
-/// the clocks explain the rest.
+/// Whether the token is valid for as long as was asked for. A service may count from its own clock or from the
+/// request's dates. So it is enough that the token ends late enough by this machine's clock, or that its own dates are
+/// far enough apart and the difference of the clocks explains the rest.
 bool LastsLongEnough(std::int64_t lifetimeSec, const Tarvel::System::DateTime &askedAt, const TokenFacts &facts,
                      std::int64_t toleranceSec) {
   const std::int64_t least = (lifetimeSec - ROUNDING_SEC) * MICROSECONDS_PER_SECOND;

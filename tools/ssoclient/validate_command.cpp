@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// `ssoclient validate`: asks the service whether it holds a token to be valid.
+/// `ssoclient validate`: asks the service whether a token is valid.
 
 #include "command.h"
 #include "connection.h"
@@ -28,14 +28,14 @@ std::string RenderVerdict(bool isValid, Format format) {
 
 ExitCode Validate(const ValidateOptions &options, const OutputOptions &output) {
   if (output.format == Format::XML) {
-    throw UsageException("a verdict has no form in XML; give --format text or json");
+    throw UsageException("a verdict has no XML form; give --format text or json");
   }
   CheckConnection(options.connection);
 
   const Tarvel::Crypto::CertificateList trusted = LoadTrusted(options.trust, output);
   const auto token = ReadToken(options.file, trusted, options.trust.toleranceSec);
-  const Connection connection = CreateConnection(options.connection, trusted, boost::none);
-  const bool isValid = CallService([&] { return connection.service->ValidateSubject(*token); });
+  const auto service = CreateService(options.connection, trusted, boost::none);
+  const bool isValid = CallService([&] { return service->ValidateSubject(*token); });
   WriteOutput(RenderVerdict(isValid, output.format));
   return isValid ? ExitCode::DONE : ExitCode::TOKEN_INVALID;
 }

@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// `ssoclient verify`: accepts a token exactly as the library does, and tells what is in it.
+/// `ssoclient verify`: verifies a token exactly as the library does, and shows what it says.
 
 #include "command.h"
 #include "token_report.h"

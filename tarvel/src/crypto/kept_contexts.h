@@ -59,7 +59,7 @@ public:
   }
 
 private:
-  static constexpr std::size_t SHARDS = 4; // threads beyond these that use contexts of one kind at once make their own
+  static constexpr std::size_t SHARDS = 4; // if more threads use one kind at once, the others make their own
 
   using Pointer = typename Handle::pointer;
   using Slot = std::atomic<Pointer>;
@@ -68,7 +68,7 @@ private:
     std::array<Slot, KINDS> slots{};
   };
 
-  /// `distance` is counted in shards from the calling thread's own.
+  /// The slot that is `distance` shards after that of the calling thread.
   Slot &GetSlot(std::size_t distance, std::size_t kind) noexcept {
     return m_shards[(GetThreadShard(SHARDS) + distance) % SHARDS].slots[kind];
   }

@@ -56,7 +56,7 @@ using EscapeBlock = unsigned char __attribute__((vector_size(16)));
 
 /// Whether one of the bytes at `bytes`, as many as a block has, belongs to `SETS`, a combination of `EscapeSet`.
 template <unsigned SETS>
-bool HasEscaped(const char *bytes) noexcept {
+inline bool HasEscaped(const char *bytes) noexcept {
   EscapeBlock block;
   std::memcpy(&block, bytes, sizeof block);
   auto found = (block == '&') | (block == '<') | (block == '\r');
@@ -77,7 +77,7 @@ bool HasEscaped(const char *bytes) noexcept {
 
 /// The first byte from `from` to `end` that belongs to `SETS`, a combination of `EscapeSet`, or `end`.
 template <unsigned SETS>
-const char *FindEscaped(const char *from, const char *end) noexcept {
+inline const char *FindEscaped(const char *from, const char *end) noexcept {
   constexpr std::size_t BLOCK_BYTES = sizeof(EscapeBlock);
   const char *const begin = from;
   while (static_cast<std::size_t>(end - from) >= BLOCK_BYTES && !HasEscaped<SETS>(from)) {

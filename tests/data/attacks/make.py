@@ -1,13 +1,13 @@
 #!/usr/bin/env python3
 # SPDX-License-Identifier: Apache-2.0
-"""Makes the hostile documents of this folder out of the token fixtures beside it.
+"""Makes the hostile documents of this folder from the token fixtures in the folder tokens.
 
 Most are a genuine token that an attacker changed after the service had signed it; some are signed, with openssl and
-xmlsec1, by a key that is not trusted, or by the trusted key with an algorithm that must be refused. What becomes of
-each is written down in expected.tsv.
+xmlsec1, by a key that is not trusted, or by the trusted key with an algorithm that must be refused. The expected outcome
+of each is in expected.tsv.
 
-usage: make.py [GROUP...]   GROUP is a function at the end of this file; without one, all of them. Some documents differ
-from run to run, because a key is made for them.
+usage: make.py [GROUP...]   GROUP is one of the functions listed at the end of this file; all of them by default. Some
+documents differ from run to run, because a key is made for them.
 """
 import base64
 import os
@@ -37,7 +37,7 @@ def write(name, text):
 
 
 def change(text, old, new, count=1):
-    """`text` with `old` replaced; that it is there is part of the attack."""
+    """`text` with `old` replaced; without `old` there would be no attack."""
     assert old in text, old
     return text.replace(old, new, count)
 
@@ -65,7 +65,7 @@ SIGNATURE = re.compile(r'<ds:Signature .*?</ds:Signature>', re.S)
 
 
 def blank(text):
-    """A signed token made a template again: no digest, no signature value, no certificate."""
+    """A signed token turned into a template: without digest, signature value and certificate."""
     text = re.sub(r'<ds:DigestValue>[^<]*</ds:DigestValue>', '<ds:DigestValue/>', text)
     text = re.sub(r'<ds:SignatureValue>[^<]*</ds:SignatureValue>', '<ds:SignatureValue/>', text)
     signature = SIGNATURE.search(text).group()
@@ -78,7 +78,7 @@ ID = re.search(r' ID="([^"]*)"', bearer).group(1)
 signature = SIGNATURE.search(bearer).group()
 unsigned = bearer.replace(signature, '').strip()
 bearer = bearer.strip()
-# What the attacker would like to be: another subject under another ID, and under the genuine one's.
+# The token that the attacker wants: with another subject, once with another ID and once with the genuine one.
 forged = change(unsigned, 'alice@corp.example', 'admin@corp.example')
 forged_other_id = forged.replace(ID, '_forged')
 
@@ -96,7 +96,7 @@ def into_key_info(element):
 
 
 def wrapping():
-    """The genuine assertion is kept where its digest is right, and another one is shown to whoever reads."""
+    """The genuine assertion stays where its digest is right, and the reader is shown another one."""
     for name, evil in (('same-id', forged), ('other-id', forged_other_id)):
         write(f'wrap-original-in-object-{name}', put_signature(evil, into_signature(unsigned)))
         write(f'wrap-signed-original-in-object-{name}', put_signature(evil, into_signature(bearer)))
@@ -125,10 +125,10 @@ def wrapping():
         write(f'wrap-siblings-reversed-{name}',
               f'<envelope>{unsigned}{put_signature(evil, signature)}</envelope>')
         write(f'wrap-signed-siblings-{name}', f'<envelope>{put_signature(evil, signature)}{bearer}</envelope>')
-    # A reference that covers the whole document, in a document that grew round it.
+    # A reference that covers the whole document, in a document that was extended around it.
     empty_uri = token('reference-empty-uri').strip()
     write('wrap-empty-uri-in-envelope', f'<envelope>{empty_uri}</envelope>')
-    # The genuine token and its signature side by side in the genuine token.
+    # The genuine token and its signature as siblings in the genuine token.
     write('signature-last', change(unsigned, '</saml:Assertion>', f'{signature}</saml:Assertion>'))
     write('signature-first', change(unsigned, '<saml:Issuer', f'{signature}<saml:Issuer'))
     write('signature-in-subject', change(unsigned, '<saml:Subject>', f'<saml:Subject>{signature}'))
@@ -139,7 +139,7 @@ def wrapping():
 
 
 def duplicate_ids():
-    """A second element that answers to the reference, by each attribute that can."""
+    """A second element to which the reference could resolve, by each attribute that can be an identifier."""
     attributes = {'ID': f'ID="{ID}"', 'Id': f'Id="{ID}"', 'wsu-Id': f'xmlns:wsu="{WSU}" wsu:Id="{ID}"',
                   'xml-id': f'xml:id="{ID}"'}
     for name, attribute in attributes.items():
@@ -185,7 +185,7 @@ def entities():
 
 
 def splitting():
-    """The service signed a longer name; a reader that takes the first text only would see a shorter one."""
+    """The service signed a longer name; a reader that uses only the first text would see a shorter one."""
     template = blank(change(bearer, 'alice@corp.example', 'admin@corp.example.evil.test'))
     signed = sign(template)
     split = 'admin@corp.example{}.evil.test'
@@ -214,7 +214,7 @@ def namespaces():
     write('namespace-xml-rebound', change(bearer, '<saml:Subject>', '<saml:Subject xmlns:xml="urn:x">'))
     write('namespace-xmlns-bound', change(bearer, '<saml:Subject>', '<saml:Subject xmlns:xmlns="urn:x">'))
     full = token('full')
-    # Exclusive canonicalisation does not sign the binding of a prefix that only a type's name uses.
+    # With exclusive canonicalisation, the binding of a prefix that only a type's name uses is not signed.
     write('namespace-renew-type-rebound', change(
         full, 'xmlns:rsa="http://www.rsa.com/names/2009/12/std-ext/SAML2.0" xsi:type', 'xmlns:rsa="urn:evil" xsi:type'))
     write('namespace-delegation-type-rebound', change(
@@ -236,7 +236,7 @@ def algorithms():
             write(f'method-{name}', sign(hmac, '', '--hmackey', public_key.name))
     write('method-rsa-sha1', sign(change(template, rsa_sha256, DS + 'rsa-sha1')))
     write('method-rsa-sha224', sign(change(template, rsa_sha256, MORE + 'rsa-sha224')))
-    # Names that nobody here signs with; the name alone must be enough to refuse them.
+    # Algorithms with which nothing is signed here; the name must be enough to refuse them.
     for name, uri in (('rsa-md5', MORE + 'rsa-md5'), ('dsa-sha1', DS + 'dsa-sha1'), ('none', 'none'), ('empty', ''),
                       ('unknown', 'urn:unknown'), ('ecdsa-sha1', MORE + 'ecdsa-sha1'),
                       ('rsa-pss-parameters', 'http://www.w3.org/2007/05/xmldsig-more#rsa-pss'),
@@ -261,7 +261,7 @@ def algorithms():
 
     xpath = ('<ds:Transform Algorithm="http://www.w3.org/TR/1999/REC-xpath-19991116">'
              '<ds:XPath>not(ancestor-or-self::*[local-name()="Subject"])</ds:XPath></ds:Transform>')
-    # The service would have to be talked into signing this one; then the subject could be anything.
+    # If the service could be made to sign this one, the subject could be anything.
     write('transform-xpath', change(sign(change(template, exclusive, xpath + exclusive)),
                                     'alice@corp.example', 'admin@corp.example'))
     write('transform-xpath-alone', change(bearer, exclusive, xpath))
@@ -288,7 +288,7 @@ def algorithms():
                         ('percent-encoded', f'#%5F{ID[1:]}')):
         write(f'reference-{name}', change(bearer, uri, f'URI="{value}"'))
     write('reference-without-uri', change(bearer, uri, ''))
-    # The reference that decides is right, and another one, which must be checked as well, is not.
+    # The reference to the assertion is right, but a second one, which must be checked too, is not.
     second = signature[signature.index('<ds:Reference '):signature.index('</ds:SignedInfo>')]
     write('reference-second-unresolvable', change(bearer, '</ds:SignedInfo>', second.replace(f'#{ID}', '#_no') + '</ds:SignedInfo>'))
     write('reference-second-external', change(bearer, '</ds:SignedInfo>', second.replace(f'#{ID}', 'http://127.0.0.1:9/x') + '</ds:SignedInfo>'))
@@ -324,7 +324,7 @@ def signature_values():
     write('digest-value-truncated', change(bearer, digest, base64.b64encode(base64.b64decode(digest)[:-1]).decode()))
     write('digest-value-longer', change(bearer, digest, base64.b64encode(base64.b64decode(digest) + b'\0').decode()))
     write('digest-value-missing', change(bearer, f'<ds:DigestValue>{digest}</ds:DigestValue>', ''))
-    # Of another token that the same key signed.
+    # The value from another token that the same key signed.
     other = re.search(r'<ds:SignatureValue>([^<]*)</ds:SignatureValue>', token('full')).group(1)
     write('value-of-another-token', change(bearer, value, other))
     write('signature-of-another-token', put_signature(unsigned, SIGNATURE.search(token('full')).group()))
@@ -347,10 +347,10 @@ def signature_values():
 
 
 def resigned_digests():
-    """The trusted key signed a digest that does not fit: only the comparison of the digest is left to notice.
+    """The trusted key signed a wrong digest: only the comparison of the digest can detect it.
 
-    xmlsec1 writes digests of its own making when it signs. So it only canonicalises SignedInfo here, and openssl signs
-    those octets with another digest in them.
+    When xmlsec1 signs, it computes the digests itself. So here it only canonicalises SignedInfo, and openssl signs those
+    octets with another digest in them.
     """
     with tempfile.TemporaryDirectory() as folder:
         source, octets = os.path.join(folder, 'in.xml'), os.path.join(folder, 'octets')
@@ -375,7 +375,7 @@ def resigned_digests():
 
 
 def foreign_keys():
-    """Signed by the attacker's own key, which the token itself offers for the check."""
+    """Signed by the attacker's own key, which the token itself contains for the check."""
     template = blank(change(bearer, 'alice@corp.example', 'admin@corp.example'))
     key_info = re.compile(r'<ds:KeyInfo>.*?</ds:KeyInfo>', re.S)
     write('foreign-certificate', sign(template, 'other'))
@@ -388,7 +388,7 @@ def foreign_keys():
     write('foreign-retrieval-method', key_info.sub(
         f'<ds:KeyInfo><ds:RetrievalMethod URI="http://127.0.0.1:9/key" Type="{DS}X509Data"/></ds:KeyInfo>', sign(template, 'other')))
     with tempfile.TemporaryDirectory() as folder:
-        # A certificate that names the same owner as the trusted one.
+        # A certificate with the same subject as the trusted one.
         path = os.path.join(folder, 'same-name')
         run('openssl', 'req', '-x509', '-newkey', 'rsa:2048', '-nodes', '-subj', '/O=Example/CN=sts', '-days', '36500',
             '-keyout', path + '.key', '-out', path + '.crt')

@@ -1,20 +1,20 @@
 #!/bin/bash
 # SPDX-License-Identifier: Apache-2.0
-# Makes the key, certificate and signature fixtures of this folder, with openssl (3.0 or later). What is there already is
-# kept, for the other fixtures rest on it; to make all anew, delete all but this file. Every passphrase is "open sesame".
+# Makes the key, certificate and signature fixtures of this folder, with openssl (3.0 or later). Existing files are kept,
+# because other fixtures depend on them; to make all again, delete all except this file. Every passphrase is "open sesame".
 set -euo pipefail
 cd "$(dirname "$0")"
 
 PASSPHRASE=pass:open\ sesame
 
-# missing FILE: whether FILE is still to be made; says so.
+# missing FILE: whether FILE does not exist yet; if so, prints that it is being made.
 missing() {
   [ ! -f "$1" ] || return 1
   echo "making $1"
 }
 
-# certificate NAME SUBJECT: a self-signed certificate, 2020 to 2120, for NAME.key. `openssl req` takes no dates before OpenSSL
-# 3.4, so `openssl ca` makes it.
+# certificate NAME SUBJECT: makes a self-signed certificate, valid from 2020 to 2120, for NAME.key. With `openssl ca`, because
+# `openssl req` accepts no dates before OpenSSL 3.4.
 certificate() {
   local name=$1 subject=$2 ca
   missing "$name.crt" || return 0
@@ -39,7 +39,7 @@ END
   rm -r "$ca"
 }
 
-# identity NAME KEY_OPTIONS...: a key with its certificate.
+# identity NAME KEY_OPTIONS...: makes a key with its certificate.
 identity() {
   local name=$1
   shift
@@ -60,7 +60,7 @@ identity ed25519 -algorithm ED25519
 [ -f names.key ] || cp rsa2048.key names.key
 certificate names '/O=Exämple, Inc./CN=Zoë \+ "Ω"'
 
-# Certificates in other wrappings.
+# Certificates in other formats.
 for name in rsa2048 p256; do
   ! missing "$name.crt.der" || openssl x509 -in "$name.crt" -outform DER -out "$name.crt.der"
 done
@@ -68,7 +68,7 @@ done
 ! missing bundle.pem || { echo "A comment before the first block"; cat rsa2048.crt p256.crt rsa3072.crt; } >bundle.pem
 ! missing bundle-with-key.pem || cat rsa2048.crt rsa2048.key p256.crt >bundle-with-key.pem
 
-# Private keys in every form.
+# Private keys in every format.
 for name in rsa2048 p256; do
   ! missing "$name.key.der" || openssl pkey -in "$name.key" -outform DER -out "$name.key.der"
   ! missing "$name-traditional.key" || openssl pkey -in "$name.key" -traditional -out "$name-traditional.key"
@@ -98,17 +98,17 @@ done
   -out certificate-only.p12
 ! missing key-only.p12 || openssl pkcs12 -export -nocerts -inkey rsa2048.key -passout "$PASSPHRASE" -out key-only.p12
 
-# Signatures over message.txt: NAME-SCHEME-DIGEST.sig. ECDSA values also as r and s side by side, NAME-ecdsa-DIGEST.raw.
+# Signatures over message.txt: NAME-SCHEME-DIGEST.sig. ECDSA values also as r followed by s, NAME-ecdsa-DIGEST.raw.
 ! missing message.txt || printf 'What is signed is what was meant.\n' >message.txt
 
-# number DER INDEX BYTES: the DER sequence's integer number INDEX as BYTES bytes in hexadecimal.
+# number DER INDEX BYTES: prints integer number INDEX of the DER sequence as BYTES bytes in hexadecimal.
 number() {
   local hex
   hex=$(openssl asn1parse -inform DER -in "$1" | sed -n 's/.*INTEGER *://p' | sed -n "$2p")
   printf "%$(($3 * 2))s" "$hex" | tr ' ' 0
 }
 
-# ecdsa NAME BYTES: signatures with NAME.key, whose curve's order has BYTES bytes.
+# ecdsa NAME BYTES: makes signatures with NAME.key, whose curve's order has BYTES bytes.
 ecdsa() {
   local name=$1 bytes=$2 digest hex
   for digest in sha256 sha384 sha512; do

@@ -1,7 +1,7 @@
 #!/bin/bash
 # SPDX-License-Identifier: Apache-2.0
-# Makes the keys and certificates of this folder with openssl (3.0 or later). What is there already is kept; to make all
-# anew, delete all but this file.
+# Makes the keys and certificates of this folder with openssl (3.0 or later). Existing files are kept; to make all again,
+# delete all except this file.
 set -euo pipefail
 cd "$(dirname "$0")"
 
@@ -22,9 +22,9 @@ unique_subject = no
 CN = supplied
 END
 
-# certificate NAME ISSUER EXTENSIONS [START END]: NAME.key and NAME.crt with the subject CN=NAME, signed by ISSUER's key (its own
-# when it is NAME), 2020 to 2120 unless said otherwise. `openssl x509` takes no dates before OpenSSL 3.4, so `openssl ca`.
-# A NAME.key that is there already is kept.
+# certificate NAME ISSUER EXTENSIONS [START END]: makes NAME.key and NAME.crt with the subject CN=NAME, signed by ISSUER's key
+# (by its own key when ISSUER is NAME), valid from 2020 to 2120 by default. With `openssl ca`, because `openssl x509` accepts
+# no dates before OpenSSL 3.4. An existing NAME.key is kept.
 certificate() {
   local name=$1 issuer=$2 extensions=$3 start=${4:-20200102030405Z} end=${5:-21200102030405Z} signer
   [ ! -f "$name.crt" ] || return 0

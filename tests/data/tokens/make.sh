@@ -1,8 +1,8 @@
 #!/bin/bash
 # SPDX-License-Identifier: Apache-2.0
 # Makes the token fixtures of this folder from templates/, with openssl, xmllint and xmlsec1 (1.2.37 or later).
-# Keys and certificates are made only when they are missing, so that what was signed with them stays good. RSA PKCS#1
-# signatures come out the same each time; PSS and ECDSA signatures differ from run to run.
+# Keys and certificates are made only when they are missing, so that existing signatures stay valid. RSA PKCS#1 signatures are
+# the same in each run; PSS and ECDSA signatures differ.
 set -euo pipefail
 cd "$(dirname "$0")"
 
@@ -12,8 +12,8 @@ MORE=http://www.w3.org/2001/04/xmldsig-more#
 SHA256=http://www.w3.org/2001/04/xmlenc#sha256
 ASSERTION=urn:oasis:names:tc:SAML:2.0:assertion:Assertion
 
-# certificate NAME KEY SUBJECT [FROM TO]: a self-signed certificate for the key in KEY.key. `openssl req` takes no dates
-# before OpenSSL 3.4, so `openssl ca` makes it.
+# certificate NAME KEY SUBJECT [FROM TO]: makes a self-signed certificate for the key in KEY.key. With `openssl ca`, because
+# `openssl req` accepts no dates before OpenSSL 3.4.
 certificate() {
   local name=$1 key=$2 subject=$3 from=${4:-20200101000000Z} to=${5:-21200101000000Z} ca
   [ ! -f "$name.crt" ] || return 0
@@ -38,7 +38,7 @@ END
   rm -r "$ca"
 }
 
-# identity NAME COMMON_NAME KEY_OPTIONS...: a key with its certificate.
+# identity NAME COMMON_NAME KEY_OPTIONS...: makes a key with its certificate.
 identity() {
   local name=$1 commonName=$2
   shift 2
@@ -55,14 +55,14 @@ identity sts-ec384 "sts P-384" -algorithm EC -pkeyopt ec_paramgen_curve:P-384
 identity sts-ec521 "sts P-521" -algorithm EC -pkeyopt ec_paramgen_curve:P-521
 identity other "not trusted" -algorithm RSA -pkeyopt rsa_keygen_bits:2048
 identity holder holder -algorithm RSA -pkeyopt rsa_keygen_bits:2048
-# More certificates for the first key; the dates of one are over.
+# More certificates for the first key; one has expired.
 certificate sts-rsa-reissued sts-rsa "/O=Example/CN=sts reissued"
 certificate sts-rsa-expired sts-rsa "/O=Example/CN=sts expired" 20200101000000Z 20210101000000Z
 cat sts-rsa.crt sts-rsa-2.crt >sts-bundle.pem
 cat sts-rsa.crt sts-rsa.key >certificate-with-key.pem
 openssl x509 -in sts-rsa.crt -outform DER -out sts-rsa.der
 
-# unsigned NAME TEMPLATE [option=value...]: the token before it is signed, on standard output.
+# unsigned NAME TEMPLATE [option=value...]: prints the token before it is signed.
 unsigned() {
   local name=$1 template=$2 signature=signature c14n=$EXCLUSIVE transform='' method=${MORE}rsa-sha256 digest=$SHA256
   local notBefore=2020-01-01T00:00:00.000Z notOnOrAfter=2120-01-01T00:00:00.000Z groups=0 pretty=false uri
@@ -86,7 +86,7 @@ unsigned() {
     if $pretty; then cat; else xmllint --noblanks - | sed -e '1{/^<?xml/d}'; fi
 }
 
-# token NAME TEMPLATE KEY [option=value...]: NAME.xml, signed with KEY and verified.
+# token NAME TEMPLATE KEY [option=value...]: makes NAME.xml, signed with KEY, and verifies it.
 token() {
   local name=$1 key=$3
   unsigned "$name" "$2" "${@:4}" >"$name.tmp"
@@ -96,8 +96,8 @@ token() {
     { echo "$name: does not verify"; exit 1; }
 }
 
-# pss_token NAME TEMPLATE KEY BITS: xmlsec1 1.2 knows no RSA-PSS, so it makes the token with PKCS#1 and canonicalises
-# `SignedInfo`, and openssl signs those octets with the algorithm's name replaced.
+# pss_token NAME TEMPLATE KEY BITS: xmlsec1 1.2 does not support RSA-PSS, so it makes the token with PKCS#1 and canonicalises
+# `SignedInfo`; then openssl signs those octets with the algorithm's name replaced.
 pss_token() {
   local name=$1 key=$3 bits=$4 pkcs1=${MORE}rsa-sha$4 pss=http://www.w3.org/2007/05/xmldsig-more#sha$4-rsa-MGF1 value
   unsigned "$name" "$2" "method=$pkcs1" >"$name.tmp"
@@ -125,7 +125,7 @@ token full full sts-rsa
 token bearer-5k groups sts-rsa groups=12
 token bearer-50k groups sts-rsa groups=608
 
-# Not current.
+# Not valid now.
 token expired bearer sts-rsa notOnOrAfter=2021-01-01T00:00:00.000Z
 token early bearer sts-rsa notBefore=2110-01-01T00:00:00.000Z
 
@@ -133,14 +133,14 @@ token early bearer sts-rsa notBefore=2110-01-01T00:00:00.000Z
 token signed-by-second bearer sts-rsa-2
 token signed-by-other bearer other
 
-# Ways of canonicalisation.
+# Canonicalisation algorithms.
 token c14n-inclusive full sts-rsa c14n=$C14N
 token c14n-inclusive-with-comments pretty sts-rsa "c14n=$C14N#WithComments" pretty=true
 token c14n-exclusive-with-comments pretty sts-rsa "c14n=${EXCLUSIVE}WithComments" pretty=true
 token c14n-inclusive-prefixes prefixes-on-root sts-rsa signature=signature-inclusive-prefixes
 token c14n-mixed full sts-rsa c14n=$C14N transform=$EXCLUSIVE
 
-# Ways of writing.
+# Styles of prefixes and white space.
 token style-default-namespace default-namespace sts-rsa
 token style-prefixes-on-root prefixes-on-root sts-rsa
 token style-prefixes-on-root-inclusive prefixes-on-root sts-rsa c14n=$C14N

@@ -1,8 +1,8 @@
 #!/bin/bash
 # SPDX-License-Identifier: Apache-2.0
-# Makes certificates whose RSA exponent is no good, with openssl (3.0 or later), from the modulus of sts-rsa.crt: openssl
-# makes no such keys, so their encoding is composed. And a signature value that everybody can compute: with the exponent 1,
-# what a value is raised to is the value itself, so the padded digest is its own signature.
+# Makes certificates with unusable RSA exponents, with openssl (3.0 or later), from the modulus of sts-rsa.crt: openssl makes
+# no such keys, so this script composes their encoding. Also makes a signature value that anyone can compute: with the
+# exponent 1, each value is its own power, so the padded digest is its own signature.
 set -euo pipefail
 cd "$(dirname "$0")"
 work=$(mktemp -d)
@@ -32,7 +32,7 @@ for exponent in 1 2 3; do
   [ -f "sts-rsa-e$exponent.crt" ] || certificate "$exponent"
 done
 
-# The padded digest of SignedInfo in rsa-sha256.xml, which the genuine key gives back.
+# The padded digest of SignedInfo in rsa-sha256.xml, recovered from its signature with the genuine key.
 sed -n 's/.*<ds:SignatureValue>//; T; :more; /SignatureValue>/!{N; b more}; s/<\/ds:SignatureValue>.*//; s/[[:space:]]//g; p; q' \
   rsa-sha256.xml | base64 -d >"$work/value"
 openssl pkeyutl -verifyrecover -certin -inkey sts-rsa.crt -pkeyopt rsa_padding_mode:none -in "$work/value" |

@@ -1,7 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// A program that is built against the installed package alone, with a static object that verifies a token before main: TOKEN
-/// by CERTIFICATE, both of the environment. Prints who the token speaks for.
+/// A program that is built only against the installed package. A static object verifies a token before main: the
+/// environment variable TOKEN is the token's file, CERTIFICATE the trusted certificate. Prints the token's subject.
 
 #include <ssoclient/create_saml_token.h>
 

@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// A program of someone who has only the installed package: prints who a token speaks for, or why it is refused.
+/// A program that is built only against the installed package: prints a token's subject, or why the token is refused.
 
 #include <ssoclient/create_saml_token.h>
 #include <ssoclient/exceptions.h>

@@ -1,5 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
-// Loads a plug-in, has it work, and lets go of it. Threads of the library live on: it must stay where it is.
+// Loads a plug-in, lets it work, and closes it. The library's threads still run, so its code must stay loaded.
 #include <dlfcn.h>
 
 #include <chrono>
@@ -25,6 +25,6 @@ int main(int argc, char **argv) {
       return 1;
     }
   }
-  std::this_thread::sleep_for(std::chrono::milliseconds(100)); // in which a thread without its code would fall
+  std::this_thread::sleep_for(std::chrono::milliseconds(100)); // time for a thread whose code was unloaded to crash
   return 0;
 }

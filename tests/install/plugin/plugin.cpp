@@ -1,5 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
-// What a plug-in does with the library: an operation that needs its threads. Nobody listens at the address.
+// A plug-in that starts an operation which needs the library's threads. No process listens at the address.
 #include <ssoclient/exceptions.h>
 #include <ssoclient/security_token_service.h>
 

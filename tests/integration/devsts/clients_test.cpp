@@ -1,5 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
-// Many clients at once, and clients that never come to a request.
+// Many clients at once, and clients that never complete a request.
 
 #include "messages.h"
 
@@ -17,7 +17,7 @@ public:
   explicit SteadyClient(const Testing::DevSts &service)
       : m_service(service), m_signing(BuilderFor(service, "client")), m_connection(service) {}
 
-  /// One request of each kind, with what a strict service makes of it.
+  /// Sends one request of each kind, and checks the answers of a strict service.
   void RunOnce() {
     EXPECT_TRUE(IsIssued(Ask(PasswordRequest())));
     EXPECT_TRUE(IsRefused(Ask(PasswordRequest("bob@corp.example", "wonderland")), "wst:FailedAuthentication",
@@ -46,7 +46,7 @@ private:
   TlsClient m_connection;
 };
 
-TEST(Clients, OfWhichThereAreManyAreServedAtOnce) {
+TEST(Clients, AreServedAtOnceEvenWhenThereAreMany) {
   constexpr int CLIENTS = 16;
   constexpr int ROUNDS = 10;
   Testing::DevSts service;
@@ -65,7 +65,7 @@ TEST(Clients, OfWhichThereAreManyAreServedAtOnce) {
   EXPECT_EQ(service.End(SIGTERM).exitCode, 0);
 }
 
-TEST(Clients, ThatDoNotSpeakTlsAreDropped) {
+TEST(Clients, WithoutTlsAreDisconnected) {
   Testing::DevSts service;
   RawConnection client(service);
   client.Send("POST /sts HTTP/1.1\r\nHost: localhost\r\n\r\n");
@@ -75,7 +75,7 @@ TEST(Clients, ThatDoNotSpeakTlsAreDropped) {
       << service.GetLog();
 }
 
-TEST(Clients, ThatSayNothingHoldNobodyUp) {
+TEST(Clients, ThatSendNothingDoNotDelayOthers) {
   Testing::DevSts service;
   std::deque<RawConnection> silent;
   std::deque<TlsClient> slow;

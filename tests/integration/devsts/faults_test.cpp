@@ -1,5 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
-// The faults, as they arrive at a client that takes bytes as they are.
+// The faults, as a client sees them that reads plain bytes.
 
 #include "messages.h"
 
@@ -20,7 +20,7 @@ class Faults : public testing::Test {
 protected:
   HttpAnswer Meet(const std::string &fault) { return Send(m_service, PasswordRequest(), "/sts/fault/" + fault); }
 
-  /// What arrives, and whether the connection ended behind it.
+  /// What arrives, and whether the connection ended afterwards.
   std::pair<HttpAnswer, bool> MeetToTheEnd(const std::string &fault) {
     TlsClient client(m_service);
     const SsoClient::Request request = PasswordRequest();
@@ -97,7 +97,7 @@ TEST_F(Faults, TokensThatDoNotHaveWhatWasAskedFor) {
   EXPECT_THAT(plain, HasSubstr("<saml:AuthnStatement "));
 }
 
-TEST_F(Faults, TokensThatLastForHalfTheTime) {
+TEST_F(Faults, TokensThatAreValidForHalfTheTime) {
   EXPECT_EQ(LifetimeIn(Meet("short-lived-token").body) * 2, LifetimeIn(Send(m_service, PasswordRequest()).body));
 }
 
@@ -140,7 +140,7 @@ TEST_F(Faults, AnswersThatBreakHttp) {
   EXPECT_GT(Meet("oversize").body.size(), 16U * 1024 * 1024);
 }
 
-TEST_F(Faults, AnswersThatTakeTheirTime) {
+TEST_F(Faults, AnswersThatAreSlow) {
   for (const char *fault : {"stall-then-answer-1", "drip-1"}) {
     const auto begin = std::chrono::steady_clock::now();
     EXPECT_TRUE(IsIssued(Meet(fault))) << fault;
@@ -148,7 +148,7 @@ TEST_F(Faults, AnswersThatTakeTheirTime) {
   }
 }
 
-TEST_F(Faults, RefusalsAreAnsweredBeforeThem) {
+TEST_F(Faults, RefusalsPrecedeThem) {
   const SsoClient::Request wrong = PasswordRequest("alice@corp.example", "wrong");
   EXPECT_TRUE(IsRefused(Send(m_service, wrong, "/sts/fault/expired-token"), "wst:FailedAuthentication",
                         "unknown user or wrong password"));
@@ -156,13 +156,13 @@ TEST_F(Faults, RefusalsAreAnsweredBeforeThem) {
                         "unknown user or wrong password"));
 }
 
-TEST_F(Faults, OnceIsMetByTheFirstRequestAlone) {
+TEST_F(Faults, OnceIsOnlyForTheFirstRequest) {
   EXPECT_EQ(Meet("bad-status/once/a").status, 503);
   EXPECT_TRUE(IsIssued(Meet("bad-status/once/a")));
   EXPECT_EQ(Meet("bad-status/once/b").status, 503);
 }
 
-TEST(FaultOption, MeetsEveryRequest) {
+TEST(FaultOption, AppliesToEveryRequest) {
   const Testing::DevSts service({"--fault", "not-soap"});
   EXPECT_THAT(Send(service, PasswordRequest()).body, testing::StartsWith("<html>"));
   EXPECT_EQ(Send(service, PasswordRequest(), "/sts/fault/bad-status").status, 503);

@@ -1,5 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
-// The HTTP side: connections that are kept, requests that are no SOAP posts, limits.
+// HTTP: persistent connections, requests that are not SOAP posts, limits.
 
 #include "messages.h"
 
@@ -74,7 +74,7 @@ TEST(HttpInAnotherCharset, RequestsAndAnswersAreInIt) {
   EXPECT_FALSE(IsIssued(sendPassword("zo\xC3\xAB", "\xC3\xBC")));
 }
 
-TEST(HttpInAnotherCharset, ARequestThatIsNotInItIsRefused) {
+TEST(HttpInAnotherCharset, ARequestInADifferentCharsetIsRefused) {
   const Testing::DevSts service({"--charset", "windows-1252"});
   SsoClient::Request request = PasswordRequest();
   request.body = Replaced(request.body, "wonderland", "\x81"); // which windows-1252 does not have
@@ -94,11 +94,11 @@ TEST_F(Http, NotHttp) {
   EXPECT_EQ(StatusOf("\x01\x02\x03 wonderland\r\n\r\n"), 400);
 }
 
-TEST_F(Http, LengthThatIsNoNumber) {
+TEST_F(Http, LengthThatIsNotANumber) {
   EXPECT_EQ(StatusOf("POST /sts HTTP/1.1\r\nContent-Length: many\r\n\r\n"), 400);
 }
 
-TEST_F(Http, ClientThatLeavesInTheMiddleHarmsNobody) {
+TEST_F(Http, ClientThatDisconnectsInTheMiddleDoesNotAffectOthers) {
   for (int i = 0; i < 20; ++i) {
     TlsClient client(m_service);
     const std::string bytes = PostBytes(SsoClient::Request::ISSUE, PasswordRequest().body);

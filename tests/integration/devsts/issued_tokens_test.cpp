@@ -85,7 +85,7 @@ protected:
   Tarvel::Ref<Tarvel::Ssl::SSLContext> m_tls = Tarvel::Ssl::CreateSSLContext();
 };
 
-TEST_F(IssuedTokens, TellWhoTheUserIs) {
+TEST_F(IssuedTokens, IdentifyTheUser) {
   const Token token = ByPassword(PlainSpec());
   EXPECT_THAT(token->GetSubject(), Is("alice", "corp.example"));
   EXPECT_THAT(GroupsOf(token), ElementsAre(Is("admins", "corp.example"), Is("users", "corp.example")));
@@ -93,7 +93,7 @@ TEST_F(IssuedTokens, TellWhoTheUserIs) {
   EXPECT_FALSE(token->IsSolution());
 }
 
-TEST_F(IssuedTokens, TellWhoTheCertificatesHolderIs) {
+TEST_F(IssuedTokens, IdentifyTheHolderOfTheCertificate) {
   const Token token = Client("client")->AcquireTokenByCertificate(PlainSpec());
   EXPECT_THAT(token->GetSubject(), Is("client", "corp.example"));
   EXPECT_THAT(GroupsOf(token), IsEmpty());
@@ -112,7 +112,7 @@ TEST_F(IssuedTokens, AreNeitherRenewableNorDelegableNorRestrictedUnlessAskedFor)
   EXPECT_THAT(DelegatesOf(token), IsEmpty());
 }
 
-TEST_F(IssuedTokens, LiveAsLongAsAskedFor) {
+TEST_F(IssuedTokens, AreValidForAsLongAsAskedFor) {
   TokenSpec spec = PlainSpec();
   spec.tokenLifetimeSec = 4321;
   EXPECT_EQ(LifetimeOf(ByPassword(spec)), 4321);
@@ -188,7 +188,7 @@ TEST_F(IssuedTokens, RenewalKeepsEverythingButTheDates) {
   EXPECT_EQ(renewed->GetConfirmationMethod(), SamlToken::HOLDER_OF_KEY);
 }
 
-TEST_F(IssuedTokens, AreHeldToBeValid) {
+TEST_F(IssuedTokens, AreValidForTheService) {
   const auto client = Client();
   EXPECT_TRUE(client->ValidateSubject(*ByPassword(PlainSpec())));
 }

@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// Messages to the development service: built by the library's own request builder, then spoilt as text.
+/// Messages to the development service: built by the library's own request builder, then corrupted as text.
 
 #pragma once
 
@@ -21,10 +21,10 @@
 
 namespace DevStsTest {
 
-/// The identity in the service's state folder of that name, as "client".
+/// The identity with that name in the service's state folder, such as "client".
 SsoClient::HolderOfKeyConfig IdentityOf(const Testing::DevSts &service, const std::string &name);
 
-/// A builder that signs with that identity; one that does not sign for an empty name.
+/// A builder that signs with that identity, or does not sign when the name is empty.
 SsoClient::RequestBuilderImpl BuilderFor(const Testing::DevSts &service, const std::string &name);
 
 /// A lifetime of an hour, and nothing else.
@@ -37,16 +37,16 @@ SsoClient::Request PasswordRequest(const std::string &user = "alice@corp.example
 SsoClient::Request CertificateRequest(const Testing::DevSts &service, const SsoClient::TokenSpec &spec = PlainSpec(),
                                       const std::string &identity = "client");
 
-/// `text` with the first `from` replaced. @throws std::runtime_error when there is none: a test that spoils nothing
+/// `text` with the first `from` replaced. @throws std::runtime_error when there is none: a test that corrupts nothing
 std::string Replaced(std::string text, std::string_view from, std::string_view to);
-/// `text` without what stands from the first `begin` to the next `end`, both included.
+/// `text` without the part from the first `begin` to the next `end`, both included.
 std::string Without(const std::string &text, std::string_view begin, std::string_view end);
-/// What stands between the first `begin` and the next `end`. @throws std::runtime_error when it is not there
+/// The text between the first `begin` and the next `end`. @throws std::runtime_error when one of them is missing
 std::string Between(const std::string &text, std::string_view begin, std::string_view end);
 
 HttpAnswer Send(const Testing::DevSts &service, const SsoClient::Request &request, std::string_view target = "/sts");
 
-/// The assertion in an answer, as something that the builder takes. @throws std::runtime_error when there is none
+/// The assertion in an answer, in a form that the builder accepts. @throws std::runtime_error when there is none
 Testing::TokenStandIn TokenIn(const HttpAnswer &answer);
 
 /// While it lives, the library's clock is that much ahead of the true time.
@@ -58,10 +58,10 @@ private:
   Tarvel::ScopedEnvironment m_scope;
 };
 
-/// The answer is a SOAP fault, by HTTP status 500, of exactly this code and text.
+/// Whether the answer is a SOAP fault with exactly this code and text, and HTTP status 500.
 testing::AssertionResult IsRefused(const HttpAnswer &answer, const std::string &code, const std::string &reason);
 
-/// The answer holds a token.
+/// Whether the answer contains a token.
 testing::AssertionResult IsIssued(const HttpAnswer &answer);
 
 } // namespace DevStsTest

@@ -24,7 +24,7 @@ using Testing::DevSts;
 using testing::HasSubstr;
 using Testing::WorkFolder;
 
-/// What a start that must fail says.
+/// The message of a start that must fail.
 std::string FailureOf(const std::vector<std::string> &arguments) {
   try {
     const DevSts service(arguments);
@@ -34,7 +34,7 @@ std::string FailureOf(const std::vector<std::string> &arguments) {
   return "started";
 }
 
-/// What the program writes to standard output, and the exit code behind it.
+/// What the program writes to standard output, followed by its exit code.
 std::string OutputOf(const std::string &arguments) {
   std::FILE *const stream = ::popen((DevSts::GetProgram() + (" " + arguments) + " </dev/null").c_str(), "r");
   std::string output;
@@ -61,7 +61,7 @@ TEST(Process, EndsWhenItsStandardInputEnds) {
   EXPECT_EQ(service.End().exitCode, 0);
 }
 
-TEST(Process, EndsAtOnceThoughConnectionsAreOpen) {
+TEST(Process, EndsAtOnceEvenWhenConnectionsAreOpen) {
   DevSts service;
   TlsClient idle(service);
   TlsClient stalled(service);
@@ -69,7 +69,7 @@ TEST(Process, EndsAtOnceThoughConnectionsAreOpen) {
   EXPECT_EQ(service.End(SIGTERM).exitCode, 0);
 }
 
-TEST(Process, ThatEndsBadlyFailsTheTestsThatUseIt) {
+TEST(Process, ThatCrashesFailsTheTestsThatUseIt) {
   testing::FLAGS_gtest_death_test_style = "threadsafe";
   const auto abortService = [] {
     const DevSts service;
@@ -78,7 +78,7 @@ TEST(Process, ThatEndsBadlyFailsTheTestsThatUseIt) {
   EXPECT_EXIT(abortService(), testing::ExitedWithCode(EXIT_FAILURE), "The development service has ended with 134\n");
 }
 
-TEST(Process, ReadyLineTellsAddressAndFiles) {
+TEST(Process, ReadyLineHasTheAddressAndTheFiles) {
   const DevSts service;
   const Testing::JsonObject ready = Testing::ReadJsonObject(service.GetReadyLine());
   EXPECT_EQ(ready.numbers.at("schema"), 1);
@@ -107,7 +107,7 @@ TEST(Process, RefusesAPortThatIsTaken) {
   EXPECT_THAT(FailureOf({"--port", std::to_string(service.GetPort())}), HasSubstr("Address already in use"));
 }
 
-TEST(State, IsForItsOwnerAlone) {
+TEST(State, IsOnlyForItsOwner) {
   const WorkFolder folder;
   const DevSts service({"--state", folder / "state"});
   EXPECT_EQ(fs::status(folder / "state").permissions(), fs::perms::owner_all);
@@ -158,7 +158,7 @@ TEST(State, IsRefusedWhenItsAuthorityHasChanged) {
   fs::remove(folder / "state/authority.crt");
   EXPECT_EQ(FailureOf({"--state", folder / "state"}),
             "development service: ended with 1: ssoclient-devsts: " + (folder / "state/tls.crt") +
-                ": is of another authority; remove the state folder, and it is made anew\n");
+                ": was issued by another authority; remove the state folder to have it made anew\n");
 }
 
 TEST(State, IsNotMadeWhenTheRestOfTheCommandLineIsWrong) {
@@ -175,16 +175,16 @@ TEST(State, IsCompletedWhenAStartWasInterrupted) {
   EXPECT_TRUE(IsIssued(Send(service, CertificateRequest(service))));
 }
 
-TEST(State, IsRefusedWhenAKeyDoesNotFit) {
+TEST(State, IsRefusedWhenAKeyDoesNotMatchItsCertificate) {
   const WorkFolder folder;
   { const DevSts service({"--state", folder / "state"}); }
   fs::copy_file(folder / "state/client.key", folder / "state/signing.key", fs::copy_options::overwrite_existing);
   EXPECT_EQ(FailureOf({"--state", folder / "state"}),
             "development service: ended with 1: ssoclient-devsts: " + (folder / "state/signing.crt") +
-                ": does not belong to the key beside it\n");
+                ": does not match the key in the same folder\n");
 }
 
-TEST(State, IsRefusedWhenItIsNoFolder) {
+TEST(State, IsRefusedWhenItIsNotAFolder) {
   const WorkFolder folder;
   const std::string file = folder.Write("file", "");
   EXPECT_EQ(FailureOf({"--state", file}),
@@ -203,7 +203,7 @@ TEST(UsersFile, ReplacesTheKnownUsers) {
       IsRefused(Send(service, PasswordRequest()), "wst:FailedAuthentication", "unknown user or wrong password"));
 }
 
-TEST(UsersFile, IsRefusedWhenItIsOfAnotherForm) {
+TEST(UsersFile, IsRefusedWhenItHasAnotherForm) {
   const WorkFolder folder;
   const auto refusal = [&folder](const std::string &content) {
     return FailureOf({"--users", folder.Write("users.json", content)});
@@ -214,17 +214,17 @@ TEST(UsersFile, IsRefusedWhenItIsOfAnotherForm) {
   EXPECT_EQ(refusal("{}"), begin + "not an array of users\n");
   EXPECT_THAT(refusal(R"([{"name":"carol@other.example"}])"), HasSubstr("key 'password' not found"));
   EXPECT_EQ(refusal(R"([{"name":"carol","password":""}])"), begin + "'carol' is not of the form name@domain\n");
-  EXPECT_EQ(refusal(R"([{"name":"c@d","password":""},{"name":"c@d","password":""}])"), begin + "'c@d' stands twice\n");
+  EXPECT_EQ(refusal(R"([{"name":"c@d","password":""},{"name":"c@d","password":""}])"), begin + "'c@d' occurs twice\n");
   EXPECT_EQ(FailureOf({"--users", folder / "missing"}),
             "development service: ended with 1: ssoclient-devsts: " + (folder / "missing") + ": cannot be read\n");
 }
 
-TEST(CommandLine, RefusalsAreOneLineAndExitCode2) {
+TEST(CommandLine, IsRefusedWithOneLineAndExitCode2) {
   const struct {
     std::vector<std::string> arguments;
     const char *message;
   } cases[] = {
-      {{"--fault", "no-such-fault"}, "--fault: no fault is named 'no-such-fault'; see --help"},
+      {{"--fault", "no-such-fault"}, "--fault: unknown fault 'no-such-fault'; see --help"},
       {{"--tolerance", "-1"}, "--tolerance: Value -1 not in range 0 to 86400"},
       {{"--port", "65536"}, "Could not convert: --port = 65536"},
       {{"--charset", "EBCDIC"}, "--charset: EBCDIC not in {UTF-8,ISO-8859-1,windows-1252}"},
@@ -238,7 +238,7 @@ TEST(CommandLine, RefusalsAreOneLineAndExitCode2) {
   EXPECT_EQ(OutputOf("2>&1"), "ssoclient-devsts: --state is required\nexit code 2");
 }
 
-TEST(CommandLine, HelpTellsOptionsFaultsAndExamplesOnStandardOutput) {
+TEST(CommandLine, HelpShowsOptionsFaultsAndExamplesOnStandardOutput) {
   const std::string help = OutputOf("--help 2>&1");
   for (const char *part : {"Usage: ssoclient-devsts [OPTIONS]\n", "--until-eof ", "\nFaults:\n", " bad-status-NNN",
                            " soap-fault-FailedAuthentication", "\nExamples:\n  ssoclient-devsts --state "}) {

@@ -1,5 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
-// Messages that are stale, carry no or wrong credentials, ask for what they prove no right to, or are no messages at all.
+// Messages that are out of date, have missing or wrong credentials, ask for more than they prove, or are malformed.
 
 #include "messages.h"
 
@@ -12,9 +12,9 @@ using std::chrono::seconds;
 
 /// How far clocks may differ by the service's default.
 constexpr seconds TOLERANCE(60);
-/// How long the library's messages are good.
+/// How long the library's messages are valid.
 constexpr seconds MESSAGE_LIFE(600);
-/// So much that a busy machine's delay does not matter.
+/// Long enough that delays of a busy machine do not matter.
 constexpr seconds MARGIN(30);
 
 constexpr const char *WST = "http://docs.oasis-open.org/ws-sx/ws-trust/200512";
@@ -22,11 +22,11 @@ constexpr const char *WST = "http://docs.oasis-open.org/ws-sx/ws-trust/200512";
 class RefusedMessages : public testing::Test {
 protected:
   HttpAnswer SendText(const std::string &text) { return Post(m_service, SsoClient::Request::ISSUE, text); }
-  HttpAnswer SendSpoilt(const std::string &from, const std::string &to) {
+  HttpAnswer SendCorrupted(const std::string &from, const std::string &to) {
     return SendText(Replaced(PasswordRequest().body, from, to));
   }
 
-  /// A signed request made when the client's clock was so far ahead.
+  /// Sends a signed request that was made with the client's clock ahead by this much.
   HttpAnswer SendMadeAhead(seconds ahead) {
     const ShiftedClock clock(ahead);
     return Send(m_service, CertificateRequest(m_service));
@@ -43,7 +43,7 @@ TEST_F(Timestamps, StaleMessage) {
 }
 
 TEST_F(Timestamps, EarlyMessage) {
-  EXPECT_TRUE(IsRefused(SendMadeAhead(TOLERANCE + MARGIN), "wsse:InvalidSecurity", "the timestamp lies in the future"));
+  EXPECT_TRUE(IsRefused(SendMadeAhead(TOLERANCE + MARGIN), "wsse:InvalidSecurity", "the timestamp is in the future"));
 }
 
 TEST_F(Timestamps, OffByLessThanTheToleranceIsAccepted) {
@@ -57,7 +57,7 @@ TEST(TimestampTolerance, IsWhatTheServiceIsStartedWith) {
   EXPECT_TRUE(IsIssued(Send(service, PasswordRequest())));
 }
 
-TEST_F(Timestamps, UnsignedMessagesAreHeldToThemToo) {
+TEST_F(Timestamps, UnsignedMessagesAreCheckedToo) {
   const ShiftedClock clock(-MESSAGE_LIFE - TOLERANCE - seconds(1));
   EXPECT_TRUE(IsRefused(Send(m_service, PasswordRequest()), "wsu:MessageExpired", "the message has expired"));
 }
@@ -67,10 +67,10 @@ TEST_F(Timestamps, MissingTimestamp) {
                         "wsse:InvalidSecurity", "no timestamp"));
 }
 
-TEST_F(Timestamps, TimestampThatIsNoDate) {
+TEST_F(Timestamps, TimestampThatIsNotADate) {
   const std::string text = PasswordRequest().body;
   EXPECT_TRUE(IsRefused(SendText(Replaced(text, Between(text, "<wsu:Created>", "<"), "today")), "wsse:InvalidSecurity",
-                        "Created of the timestamp is no UTC date"));
+                        "Created of the timestamp is not a UTC date"));
 }
 
 TEST_F(Timestamps, PeriodOfYears) {
@@ -97,24 +97,24 @@ TEST_F(Credentials, EmptyPassword) {
                         "unknown user or wrong password"));
 }
 
-// The same words as for a wrong password, so that nobody learns which users there are.
+// The same text as for a wrong password, so that the message does not reveal which users exist.
 TEST_F(Credentials, UnknownUser) {
   EXPECT_TRUE(IsRefused(Send(m_service, PasswordRequest("nobody@corp.example", "")), "wst:FailedAuthentication",
                         "unknown user or wrong password"));
 }
 
 TEST_F(Credentials, PasswordDigest) {
-  EXPECT_TRUE(IsRefused(SendSpoilt("#PasswordText", "#PasswordDigest"), "wsse:UnsupportedSecurityToken",
+  EXPECT_TRUE(IsRefused(SendCorrupted("#PasswordText", "#PasswordDigest"), "wsse:UnsupportedSecurityToken",
                         "a password must be given as text"));
 }
 
 TEST_F(Credentials, None) {
   EXPECT_TRUE(IsRefused(SendText(Without(PasswordRequest().body, "<wsse:UsernameToken ", "</wsse:UsernameToken>")),
-                        "wst:FailedAuthentication", "the message holds nothing that tells who sent it"));
+                        "wst:FailedAuthentication", "the message does not say who sent it"));
 }
 
 TEST_F(Credentials, UnknownKind) {
-  EXPECT_TRUE(IsRefused(SendSpoilt("<wsse:UsernameToken ", "<wsse:Kerberos/><wsse:UsernameToken "),
+  EXPECT_TRUE(IsRefused(SendCorrupted("<wsse:UsernameToken ", "<wsse:Kerberos/><wsse:UsernameToken "),
                         "wsse:UnsupportedSecurityToken", "unknown element in the security header: 'Kerberos'"));
 }
 
@@ -145,18 +145,18 @@ TEST_F(Proof, HolderOfKeyWithoutSignature) {
   SsoClient::Request request;
   BuilderFor(m_service, "client").BuildUserPassTokenRequest("alice@corp.example", "wonderland", spec, request);
   EXPECT_TRUE(IsRefused(Send(m_service, request), "wst:InvalidRequest",
-                        "a holder-of-key token is asked for without proof of a key"));
+                        "the request asks for a holder-of-key token without proof of a key"));
 }
 
 TEST_F(Proof, KeyTypeChangedToHolderOfKey) {
-  EXPECT_TRUE(IsRefused(SendSpoilt("/Bearer<", "/PublicKey<"), "wst:InvalidRequest",
-                        "a holder-of-key token is asked for without proof of a key"));
+  EXPECT_TRUE(IsRefused(SendCorrupted("/Bearer<", "/PublicKey<"), "wst:InvalidRequest",
+                        "the request asks for a holder-of-key token without proof of a key"));
 }
 
-TEST_F(Proof, UseKeyThatNamesAnotherSignature) {
+TEST_F(Proof, UseKeyThatRefersToAnotherSignature) {
   const std::string text = CertificateRequest(m_service).body;
   EXPECT_TRUE(IsRefused(SendText(Replaced(text, " Id=\"holderOfKeyProofSignature\"", " Id=\"otherSignature\"")),
-                        "wst:InvalidRequest", "wst:UseKey does not name the message's signature"));
+                        "wst:InvalidRequest", "wst:UseKey does not refer to the message's signature"));
 }
 
 using Malformed = RefusedMessages;
@@ -180,11 +180,12 @@ TEST_F(Malformed, EveryTruncation) {
 }
 
 TEST_F(Malformed, UnboundPrefix) {
-  EXPECT_TRUE(IsRefused(SendSpoilt("<wst:TokenType>", "<wst:TokenType x:y=\"\">"), "soapenv:Client", NOT_WELL_FORMED));
+  EXPECT_TRUE(
+      IsRefused(SendCorrupted("<wst:TokenType>", "<wst:TokenType x:y=\"\">"), "soapenv:Client", NOT_WELL_FORMED));
 }
 
 TEST_F(Malformed, UndefinedEntity) {
-  EXPECT_TRUE(IsRefused(SendSpoilt("wonderland", "&wonderland;"), "soapenv:Client", NOT_WELL_FORMED));
+  EXPECT_TRUE(IsRefused(SendCorrupted("wonderland", "&wonderland;"), "soapenv:Client", NOT_WELL_FORMED));
 }
 
 TEST_F(Malformed, DocumentTypeDeclaration) {
@@ -217,7 +218,7 @@ TEST_F(Malformed, NotAnEnvelope) {
 
 TEST_F(Malformed, EnvelopeOfSoap12) {
   EXPECT_TRUE(
-      IsRefused(SendSpoilt("http://schemas.xmlsoap.org/soap/envelope/", "http://www.w3.org/2003/05/soap-envelope"),
+      IsRefused(SendCorrupted("http://schemas.xmlsoap.org/soap/envelope/", "http://www.w3.org/2003/05/soap-envelope"),
                 "soapenv:Client", "not a SOAP 1.1 envelope"));
 }
 
@@ -229,33 +230,33 @@ TEST_F(Malformed, NoSecurityHeader) {
 TEST_F(Malformed, EmptyBody) {
   EXPECT_TRUE(
       IsRefused(SendText(Without(PasswordRequest().body, "<wst:RequestSecurityToken ", "</wst:RequestSecurityToken>")),
-                "wst:InvalidRequest", "the body must hold one element"));
+                "wst:InvalidRequest", "the body must contain one element"));
 }
 
 TEST_F(Malformed, UnknownRequestType) {
-  EXPECT_TRUE(IsRefused(SendSpoilt("/Issue<", "/Cancel<"), "wst:InvalidRequest",
+  EXPECT_TRUE(IsRefused(SendCorrupted("/Issue<", "/Cancel<"), "wst:InvalidRequest",
                         std::string("unsupported request type '") + WST + "/Cancel'"));
 }
 
 TEST_F(Malformed, UnknownKeyType) {
-  EXPECT_TRUE(IsRefused(SendSpoilt("/Bearer<", "/SymmetricKey<"), "wst:InvalidRequest",
+  EXPECT_TRUE(IsRefused(SendCorrupted("/Bearer<", "/SymmetricKey<"), "wst:InvalidRequest",
                         std::string("unsupported key type '") + WST + "/SymmetricKey'"));
 }
 
 TEST_F(Malformed, ActionOfAnotherOperation) {
   EXPECT_TRUE(IsRefused(Post(m_service, SsoClient::Request::RENEW, PasswordRequest().body), "wst:InvalidRequest",
-                        "the SOAPAction does not fit the message"));
+                        "the SOAPAction does not match the message"));
   EXPECT_TRUE(IsRefused(Post(m_service, "", PasswordRequest().body), "wst:InvalidRequest",
-                        "the SOAPAction does not fit the message"));
+                        "the SOAPAction does not match the message"));
 }
 
 TEST_F(Malformed, CommentThatSplitsAText) {
-  EXPECT_TRUE(IsRefused(SendSpoilt("alice@corp.example", "alice@corp.example<!-- -->.evil"), "wst:InvalidRequest",
-                        "Username must hold text alone"));
+  EXPECT_TRUE(IsRefused(SendCorrupted("alice@corp.example", "alice@corp.example<!-- -->.evil"), "wst:InvalidRequest",
+                        "Username must contain only text"));
 }
 
-TEST_F(Malformed, ElementThatStandsTwice) {
-  EXPECT_TRUE(IsRefused(SendSpoilt("<wst:Delegatable>", "<wst:Delegatable>true</wst:Delegatable><wst:Delegatable>"),
+TEST_F(Malformed, ElementThatOccursTwice) {
+  EXPECT_TRUE(IsRefused(SendCorrupted("<wst:Delegatable>", "<wst:Delegatable>true</wst:Delegatable><wst:Delegatable>"),
                         "wst:InvalidRequest", "several wst:Delegatable"));
 }
 

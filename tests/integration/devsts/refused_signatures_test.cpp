@@ -1,5 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
-// Signed messages that were spoilt after signing, or signed by the wrong key or over the wrong elements.
+// Signed messages that were changed after signing, or signed with the wrong key or over the wrong elements.
 
 #include "messages.h"
 
@@ -23,8 +23,8 @@ constexpr const char *NOT_COVERED = "the signature must cover the body and the t
 
 class RefusedSignatures : public testing::Test {
 protected:
-  /// Sends the request with its text replaced.
-  HttpAnswer SendSpoilt(const std::string &from, const std::string &to) {
+  /// Sends the request with `from` replaced.
+  HttpAnswer SendCorrupted(const std::string &from, const std::string &to) {
     return SendText(Replaced(m_request.body, from, to));
   }
   HttpAnswer SendText(const std::string &text) { return Post(m_service, m_request.soapAction, text); }
@@ -33,17 +33,17 @@ protected:
   const SsoClient::Request m_request = CertificateRequest(m_service);
 };
 
-TEST_F(RefusedSignatures, TheSameMessageUnspoiltIsAccepted) {
+TEST_F(RefusedSignatures, AcceptsTheSameMessageUnchanged) {
   EXPECT_TRUE(IsIssued(Send(m_service, m_request)));
 }
 
-/// What a token says of its subject and of delegation.
+/// What a token says about its subject and about delegation.
 std::string SaidIn(const HttpAnswer &answer) {
   return Between(answer.body, "<saml:Subject>", "</saml:Subject>") +
          Between(answer.body, "<saml:ProxyRestriction ", ">");
 }
 
-TEST_F(RefusedSignatures, MessageWithOneBitChangedYieldsARefusalOrWhatWasSigned) {
+TEST_F(RefusedSignatures, MessageWithOneBitChangedIsRefusedOrGetsWhatWasSigned) {
   constexpr std::size_t STEP = 3; // every octet would take too long
   const std::string signedSaying = SaidIn(Send(m_service, m_request));
   TlsClient client(m_service);
@@ -60,7 +60,7 @@ TEST_F(RefusedSignatures, MessageWithOneBitChangedYieldsARefusalOrWhatWasSigned)
     ASSERT_TRUE(IsIssued(answer)) << at;
     EXPECT_EQ(SaidIn(answer), signedSaying) << at;
   }
-  // Else only a few names that mean nothing, as a prefix that is declared and used alike.
+  // The rest are a few names without meaning, such as a prefix that changes in both its declaration and its use.
   EXPECT_GT(refusals, m_request.body.size() / STEP * 95 / 100);
 }
 
@@ -68,15 +68,15 @@ TEST_F(RefusedSignatures, SignatureValueOfAnotherMessage) {
   const std::string other = Between(CertificateRequest(m_service).body, "<ds:SignatureValue>", "<");
   const std::string own = Between(m_request.body, "<ds:SignatureValue>", "<");
   ASSERT_NE(own, other);
-  EXPECT_TRUE(IsRefused(SendSpoilt(own, other), "wsse:FailedCheck", WRONG_SIGNATURE));
+  EXPECT_TRUE(IsRefused(SendCorrupted(own, other), "wsse:FailedCheck", WRONG_SIGNATURE));
 }
 
 TEST_F(RefusedSignatures, EmptySignatureValue) {
-  EXPECT_TRUE(IsRefused(SendSpoilt(Between(m_request.body, "<ds:SignatureValue>", "<"), ""), "wsse:FailedCheck",
+  EXPECT_TRUE(IsRefused(SendCorrupted(Between(m_request.body, "<ds:SignatureValue>", "<"), ""), "wsse:FailedCheck",
                         WRONG_SIGNATURE));
 }
 
-TEST_F(RefusedSignatures, MissingSignatureBesideACertificate) {
+TEST_F(RefusedSignatures, MissingSignatureDespiteACertificate) {
   EXPECT_TRUE(IsRefused(SendText(Without(m_request.body, "<ds:Signature ", "</ds:Signature>")), "wsse:InvalidSecurity",
                         "the message presents a token or certificate and is not signed"));
 }
@@ -84,40 +84,40 @@ TEST_F(RefusedSignatures, MissingSignatureBesideACertificate) {
 TEST_F(RefusedSignatures, MissingSignatureAndCertificate) {
   const std::string unsignedText = Without(m_request.body, "<ds:Signature ", "</ds:Signature>");
   EXPECT_TRUE(IsRefused(SendText(Without(unsignedText, "<wsse:BinarySecurityToken ", "</wsse:BinarySecurityToken>")),
-                        "wst:FailedAuthentication", "the message holds nothing that tells who sent it"));
+                        "wst:FailedAuthentication", "the message does not say who sent it"));
 }
 
 TEST_F(RefusedSignatures, BodyChangedAfterSigning) {
   EXPECT_TRUE(
-      IsRefused(SendSpoilt("<wst:Delegatable>false", "<wst:Delegatable>true"), "wsse:FailedCheck", WRONG_SIGNATURE));
+      IsRefused(SendCorrupted("<wst:Delegatable>false", "<wst:Delegatable>true"), "wsse:FailedCheck", WRONG_SIGNATURE));
 }
 
 TEST_F(RefusedSignatures, BodySwappedForThatOfAnotherSignedMessage) {
   const std::string other = CertificateRequest(m_service, RenewableSpec()).body;
-  EXPECT_TRUE(IsRefused(SendSpoilt(Between(m_request.body, "<wst:RequestSecurityToken ", "</soapenv:Body>"),
-                                   Between(other, "<wst:RequestSecurityToken ", "</soapenv:Body>")),
+  EXPECT_TRUE(IsRefused(SendCorrupted(Between(m_request.body, "<wst:RequestSecurityToken ", "</soapenv:Body>"),
+                                      Between(other, "<wst:RequestSecurityToken ", "</soapenv:Body>")),
                         "wsse:FailedCheck", WRONG_SIGNATURE));
 }
 
-// The signed body still stands in the message and still verifies, but it is not the body that is obeyed.
+// The signed body is still in the message, and still verifies, but it is not the body that the service reads.
 TEST_F(RefusedSignatures, SignedBodyMovedAsideForAnotherBody) {
   const std::string signedBody = "<soapenv:Body " + Between(m_request.body, "<soapenv:Body ", "</soapenv:Body>");
   const std::string content = Between(m_request.body, "<wst:RequestSecurityToken ", "</wst:RequestSecurityToken>");
   const std::string forged = "<soapenv:Body><wst:RequestSecurityToken " +
                              Replaced(content, "<wst:Delegatable>false", "<wst:Delegatable>true") + signedBody +
                              "</soapenv:Body></wst:RequestSecurityToken>";
-  EXPECT_TRUE(IsRefused(SendSpoilt(signedBody, forged), "wsse:InvalidSecurity", NOT_COVERED));
+  EXPECT_TRUE(IsRefused(SendCorrupted(signedBody, forged), "wsse:InvalidSecurity", NOT_COVERED));
 }
 
-TEST_F(RefusedSignatures, SecondBodyBesideTheSignedOne) {
-  EXPECT_TRUE(IsRefused(SendSpoilt("<soapenv:Body ", "<soapenv:Body/><soapenv:Body "), "soapenv:Client",
-                        "an envelope must hold one header and one body"));
+TEST_F(RefusedSignatures, SecondBodyNextToTheSignedOne) {
+  EXPECT_TRUE(IsRefused(SendCorrupted("<soapenv:Body ", "<soapenv:Body/><soapenv:Body "), "soapenv:Client",
+                        "an envelope must contain one header and one body"));
 }
 
 TEST_F(RefusedSignatures, TimestampChangedAfterSigning) {
   const std::string expires = Between(m_request.body, "<wsu:Expires>", "<");
   const std::string later = Replaced(expires, "Z", "0Z");
-  EXPECT_TRUE(IsRefused(SendSpoilt(expires, later), "wsse:FailedCheck", WRONG_SIGNATURE));
+  EXPECT_TRUE(IsRefused(SendCorrupted(expires, later), "wsse:FailedCheck", WRONG_SIGNATURE));
 }
 
 TEST_F(RefusedSignatures, SignedTimestampMovedAsideForAnotherTimestamp) {
@@ -127,7 +127,7 @@ TEST_F(RefusedSignatures, SignedTimestampMovedAsideForAnotherTimestamp) {
       "<wsu:Created>" + Between(timestamp, "<wsu:Created>", "</wsu:Expires>") + "</wsu:Expires>";
   const std::string forged = std::string("<wsu:Timestamp xmlns:wsu=\"") + std::string(SsoClient::Namespaces::WSU) +
                              "\">" + created + timestamp + "</wsu:Timestamp>";
-  EXPECT_TRUE(IsRefused(SendSpoilt(timestamp, forged), "wsse:InvalidSecurity", NOT_COVERED));
+  EXPECT_TRUE(IsRefused(SendCorrupted(timestamp, forged), "wsse:InvalidSecurity", NOT_COVERED));
 }
 
 TEST_F(RefusedSignatures, TimestampThatIsNotSigned) {
@@ -144,21 +144,21 @@ TEST_F(RefusedSignatures, TimestampThatIsNotSigned) {
                 "wsse:InvalidSecurity", NOT_COVERED));
 }
 
-TEST_F(RefusedSignatures, IdentifierThatStandsTwice) {
+TEST_F(RefusedSignatures, IdentifierThatOccursTwice) {
   const std::string id = Between(m_request.body, "<soapenv:Body xmlns:wst=", " wsu:Id=\"");
   const std::string bodyId = Between(m_request.body, id + " wsu:Id=\"", "\"");
-  EXPECT_TRUE(IsRefused(SendSpoilt("<wst:TokenType>", "<wst:TokenType Id=\"" + bodyId + "\">"), "wsse:InvalidSecurity",
-                        "the identifier '" + bodyId + "' stands twice"));
+  EXPECT_TRUE(IsRefused(SendCorrupted("<wst:TokenType>", "<wst:TokenType Id=\"" + bodyId + "\">"),
+                        "wsse:InvalidSecurity", "the identifier '" + bodyId + "' occurs twice"));
 }
 
 TEST_F(RefusedSignatures, ElementWithTwoIdentifiers) {
-  EXPECT_TRUE(IsRefused(SendSpoilt("<soapenv:Body ", "<soapenv:Body Id=\"second\" "), "wsse:InvalidSecurity",
+  EXPECT_TRUE(IsRefused(SendCorrupted("<soapenv:Body ", "<soapenv:Body Id=\"second\" "), "wsse:InvalidSecurity",
                         "one element has several identifiers"));
 }
 
 TEST_F(RefusedSignatures, XmlIdCountsAsIdentifier) {
-  EXPECT_TRUE(IsRefused(SendSpoilt("<wst:TokenType>", "<wst:TokenType xml:id=\"holderOfKeyCertificate\">"),
-                        "wsse:InvalidSecurity", "the identifier 'holderOfKeyCertificate' stands twice"));
+  EXPECT_TRUE(IsRefused(SendCorrupted("<wst:TokenType>", "<wst:TokenType xml:id=\"holderOfKeyCertificate\">"),
+                        "wsse:InvalidSecurity", "the identifier 'holderOfKeyCertificate' occurs twice"));
 }
 
 TEST_F(RefusedSignatures, KeyOfAnotherCertificate) {
@@ -172,13 +172,13 @@ TEST_F(RefusedSignatures, KeyOfAnotherCertificate) {
 TEST_F(RefusedSignatures, CertificateOfAnotherAuthority) {
   EXPECT_TRUE(IsRefused(Send(m_service, CertificateRequest(m_service, PlainSpec(), "foreign")),
                         "wst:FailedAuthentication",
-                        "the certificate is none that the service's authority gave a client"));
+                        "the certificate is not a client certificate of the service's authority"));
 }
 
 TEST_F(RefusedSignatures, CertificateOfTheAuthorityThatIsNotForClients) {
   for (const char *name : {"signing", "tls", "authority"}) {
     EXPECT_TRUE(IsRefused(Send(m_service, CertificateRequest(m_service, PlainSpec(), name)), "wst:FailedAuthentication",
-                          "the certificate is none that the service's authority gave a client"))
+                          "the certificate is not a client certificate of the service's authority"))
         << name;
   }
 }
@@ -190,35 +190,35 @@ TEST_F(RefusedSignatures, KeyOf1024Bits) {
   SsoClient::Request request;
   SsoClient::RequestBuilderImpl(weak).BuildCertificateTokenRequest(PlainSpec(), request);
   EXPECT_TRUE(IsRefused(Send(m_service, request), "wsse:InvalidSecurityToken",
-                        "the signer's certificate must hold an RSA key of at least 2048 bits"));
+                        "the signer's certificate must have an RSA key of at least 2048 bits"));
 }
 
-TEST_F(RefusedSignatures, KeyReferenceToNoCertificate) {
-  EXPECT_TRUE(IsRefused(SendSpoilt("URI=\"#holderOfKeyCertificate\"", "URI=\"#holderOfKeyProofSignature\""),
+TEST_F(RefusedSignatures, KeyReferenceToAnElementThatIsNotACertificate) {
+  EXPECT_TRUE(IsRefused(SendCorrupted("URI=\"#holderOfKeyCertificate\"", "URI=\"#holderOfKeyProofSignature\""),
                         "wsse:SecurityTokenUnavailable",
-                        "the signature's key reference points at no binary security token"));
+                        "the signature's key reference does not refer to a binary security token"));
 }
 
-TEST_F(RefusedSignatures, ReferenceOutOfTheMessage) {
-  EXPECT_TRUE(IsRefused(SendSpoilt("<ds:Reference URI=\"#", "<ds:Reference URI=\"https://localhost/#"),
-                        "wsse:InvalidSecurity", "a signature may refer to elements of the message alone"));
+TEST_F(RefusedSignatures, ReferenceToAnotherDocument) {
+  EXPECT_TRUE(IsRefused(SendCorrupted("<ds:Reference URI=\"#", "<ds:Reference URI=\"https://localhost/#"),
+                        "wsse:InvalidSecurity", "a signature may refer only to elements of the message"));
 }
 
 TEST_F(RefusedSignatures, ReferenceThatIsAnXPointer) {
-  EXPECT_TRUE(IsRefused(SendSpoilt("<ds:Reference URI=\"#", "<ds:Reference URI=\"#xpointer(/)"), "wsse:InvalidSecurity",
-                        "a signature may refer to elements of the message alone"));
+  EXPECT_TRUE(IsRefused(SendCorrupted("<ds:Reference URI=\"#", "<ds:Reference URI=\"#xpointer(/)"),
+                        "wsse:InvalidSecurity", "a signature may refer only to elements of the message"));
 }
 
-TEST_F(RefusedSignatures, ReferenceToNothing) {
-  EXPECT_TRUE(IsRefused(SendSpoilt("<ds:Reference URI=\"#", "<ds:Reference URI=\"#no"), "wsse:InvalidSecurity",
-                        "the signature refers to what is not there"));
+TEST_F(RefusedSignatures, ReferenceToAMissingElement) {
+  EXPECT_TRUE(IsRefused(SendCorrupted("<ds:Reference URI=\"#", "<ds:Reference URI=\"#no"), "wsse:InvalidSecurity",
+                        "the signature refers to an element that does not exist"));
 }
 
 struct Algorithm {
   const char *name;
   const char *from;
   const char *to;
-  const char *refused; ///< the algorithm that the refusal names
+  const char *refused; ///< the algorithm in the refusal
 };
 
 void PrintTo(const Algorithm &algorithm, std::ostream *out) {
@@ -249,7 +249,7 @@ constexpr Algorithm ALGORITHMS[] = {
 };
 
 TEST_P(RefusedAlgorithms, AreNamed) {
-  EXPECT_TRUE(IsRefused(SendSpoilt(GetParam().from, GetParam().to), "wsse:UnsupportedAlgorithm",
+  EXPECT_TRUE(IsRefused(SendCorrupted(GetParam().from, GetParam().to), "wsse:UnsupportedAlgorithm",
                         std::string("unsupported algorithm or parameters: '") + GetParam().refused + "'"));
 }
 
@@ -257,22 +257,23 @@ INSTANTIATE_TEST_SUITE_P(Each, RefusedAlgorithms, testing::ValuesIn(ALGORITHMS),
                          [](const auto &instance) { return std::string(instance.param.name); });
 
 TEST_F(RefusedSignatures, SecondTransform) {
-  EXPECT_TRUE(
-      IsRefused(SendSpoilt("</ds:Transforms>", "<ds:Transform Algorithm=\"http://www.w3.org/2001/10/xml-exc-c14n#\"/>"
-                                               "<ds:Transform Algorithm=\"http://www.w3.org/2001/10/xml-exc-c14n#\"/>"
-                                               "</ds:Transforms>"),
-                "wsse:UnsupportedAlgorithm", "unsupported number of transforms"));
+  EXPECT_TRUE(IsRefused(SendCorrupted("</ds:Transforms>",
+                                      "<ds:Transform Algorithm=\"http://www.w3.org/2001/10/xml-exc-c14n#\"/>"
+                                      "<ds:Transform Algorithm=\"http://www.w3.org/2001/10/xml-exc-c14n#\"/>"
+                                      "</ds:Transforms>"),
+                        "wsse:UnsupportedAlgorithm", "unsupported number of transforms"));
 }
 
 TEST_F(RefusedSignatures, EnvelopedTransform) {
   EXPECT_TRUE(IsRefused(
-      SendSpoilt("<ds:Transforms>",
-                 "<ds:Transforms><ds:Transform Algorithm=\"http://www.w3.org/2000/09/xmldsig#enveloped-signature\"/>"),
-      "wsse:InvalidSecurity", "the signature refers to what is not there"));
+      SendCorrupted(
+          "<ds:Transforms>",
+          "<ds:Transforms><ds:Transform Algorithm=\"http://www.w3.org/2000/09/xmldsig#enveloped-signature\"/>"),
+      "wsse:InvalidSecurity", "the signature refers to an element that does not exist"));
 }
 
 TEST_F(RefusedSignatures, ManifestInTheSignature) {
-  EXPECT_TRUE(IsRefused(SendSpoilt("</ds:KeyInfo>", "</ds:KeyInfo><ds:Object><ds:Manifest/></ds:Object>"),
+  EXPECT_TRUE(IsRefused(SendCorrupted("</ds:KeyInfo>", "</ds:KeyInfo><ds:Object><ds:Manifest/></ds:Object>"),
                         "wsse:InvalidSecurity", "unexpected content of ds:Signature"));
 }
 
@@ -280,7 +281,7 @@ TEST_F(RefusedSignatures, SecondSignature) {
   const std::string signature =
       "<ds:Signature " + Between(m_request.body, "<ds:Signature ", "</ds:Signature>") + "</ds:Signature>";
   const std::string second = Replaced(signature, "holderOfKeyProofSignature", "second");
-  EXPECT_TRUE(IsRefused(SendSpoilt(signature, signature + second), "wsse:InvalidSecurity",
+  EXPECT_TRUE(IsRefused(SendCorrupted(signature, signature + second), "wsse:InvalidSecurity",
                         "several Signature in the security header"));
 }
 

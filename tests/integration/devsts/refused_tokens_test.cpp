@@ -1,5 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
-// Exchange, renewal and validation of tokens that are expired, foreign, changed, somebody else's, or not made for it.
+// Exchange, renewal and validation of tokens that are expired, foreign, changed, bound to another key, or of the wrong
+// kind.
 
 #include "messages.h"
 
@@ -11,7 +12,7 @@ constexpr const char *INVALID = "http://docs.oasis-open.org/ws-sx/ws-trust/20051
 
 class RefusedTokens : public testing::Test {
 protected:
-  /// A holder-of-key token for "client", by way of a fault if there is one.
+  /// A holder-of-key token for "client", issued with `fault` unless that is empty.
   Testing::TokenStandIn Acquire(const std::string &fault = {}, const SsoClient::TokenSpec &spec = RenewableSpec()) {
     return TokenIn(
         Send(m_service, CertificateRequest(m_service, spec), fault.empty() ? "/sts" : "/sts/fault/" + fault));
@@ -31,14 +32,14 @@ protected:
     return Send(m_service, request);
   }
 
-  /// The status that the service gives the token.
+  /// The status that the service reports for the token.
   std::string Validate(const SsoClient::SamlToken &token) {
     SsoClient::Request request;
     BuilderFor(m_service, "").BuildValidateSubjectRequest(token, request);
     return Between(Send(m_service, request).body, "<wst:Code>", "</wst:Code>");
   }
 
-  /// The token with a text replaced after signing.
+  /// The token with a text replaced after it was signed.
   static Testing::TokenStandIn Changed(const SsoClient::SamlToken &token, const std::string &from,
                                        const std::string &to) {
     return {token.GetId(), Replaced(token.ToXml(), from, to), token.GetConfirmationMethod()};
@@ -64,12 +65,12 @@ TEST_F(RefusedTokens, ExchangeOfATokenThatIsNotValidYet) {
 
 TEST_F(RefusedTokens, ExchangeOfAForeignToken) {
   EXPECT_TRUE(IsRefused(Exchange(Acquire("wrong-signer")), "wsse:InvalidSecurityToken",
-                        "the token's signature is not this service's"));
+                        "the token is not signed by this service"));
 }
 
 TEST_F(RefusedTokens, ExchangeOfAChangedToken) {
   EXPECT_TRUE(IsRefused(Exchange(Acquire("tampered-token")), "wsse:InvalidSecurityToken",
-                        "the token's signature is not this service's"));
+                        "the token is not signed by this service"));
 }
 
 TEST_F(RefusedTokens, ExchangeOfAnUnsignedToken) {
@@ -80,9 +81,9 @@ TEST_F(RefusedTokens, ExchangeByAnotherKeyThanTheTokens) {
   EXPECT_TRUE(IsRefused(Exchange(Acquire(), "other-client"), "wsse:FailedCheck", "the message's signature is wrong"));
 }
 
-TEST_F(RefusedTokens, ExchangeOfABearerTokenWhichNamesNoKey) {
+TEST_F(RefusedTokens, ExchangeOfABearerTokenWhichHasNoKey) {
   EXPECT_TRUE(IsRefused(Exchange(AcquireBearer()), "wsse:SecurityTokenUnavailable",
-                        "a bearer token names no key that could have signed the message"));
+                        "a bearer token has no key that could have signed the message"));
 }
 
 TEST_F(RefusedTokens, ExchangeWithoutSignature) {
@@ -95,12 +96,12 @@ TEST_F(RefusedTokens, ExchangeWithoutSignature) {
                         "the message presents a token or certificate and is not signed"));
 }
 
-TEST_F(RefusedTokens, ExchangeThatNamesAnotherTokensKey) {
+TEST_F(RefusedTokens, ExchangeWithAReferenceToAnotherTokensKey) {
   SsoClient::Request request;
   BuilderFor(m_service, "client").BuildExchangeTokenRequest(Acquire(), PlainSpec(), request);
   request.body = Replaced(request.body, "#SAMLID\">_", "#SAMLID\">_0");
   EXPECT_TRUE(IsRefused(Send(m_service, request), "wsse:SecurityTokenUnavailable",
-                        "the signature's key reference names no token of the message"));
+                        "the signature's key reference does not refer to a token of the message"));
 }
 
 TEST_F(RefusedTokens, DelegationOfATokenThatIsNotDelegable) {
@@ -110,7 +111,7 @@ TEST_F(RefusedTokens, DelegationOfATokenThatIsNotDelegable) {
                         "the presented token may not be delegated"));
 }
 
-// The genuine token stands in the message too, where nobody looks, and its signature holds.
+// The genuine token is also in the message, at a place that the service does not read, and its signature is valid.
 TEST_F(RefusedTokens, ExchangeOfATokenWrappedInAForgedOne) {
   const Testing::TokenStandIn genuine = Acquire();
   std::string forged = Replaced(genuine.ToXml(), genuine.GetId(), "_forged");
@@ -135,14 +136,14 @@ TEST_F(RefusedTokens, RenewalOfAnExpiredToken) {
 }
 
 TEST_F(RefusedTokens, RenewalOfAForeignToken) {
-  EXPECT_TRUE(IsRefused(Renew(Acquire("wrong-signer")), "wst:InvalidSecurityToken",
-                        "the token's signature is not this service's"));
+  EXPECT_TRUE(
+      IsRefused(Renew(Acquire("wrong-signer")), "wst:InvalidSecurityToken", "the token is not signed by this service"));
 }
 
 TEST_F(RefusedTokens, RenewalOfAChangedToken) {
   const Testing::TokenStandIn token = Acquire({}, PlainSpec());
   EXPECT_TRUE(IsRefused(Renew(Changed(token, "Count=\"0\" Postdatable", "Count=\"9\" Postdatable")),
-                        "wst:InvalidSecurityToken", "the token's signature is not this service's"));
+                        "wst:InvalidSecurityToken", "the token is not signed by this service"));
 }
 
 TEST_F(RefusedTokens, RenewalOfABearerToken) {
@@ -168,7 +169,7 @@ TEST_F(RefusedTokens, EleventhRenewal) {
   EXPECT_TRUE(IsRefused(Renew(token), "wst:UnableToRenew", "the token is not renewable"));
 }
 
-TEST_F(RefusedTokens, ValidationSaysInvalidOfEachOfThem) {
+TEST_F(RefusedTokens, ValidationReportsEachOfThemAsInvalid) {
   EXPECT_EQ(Validate(Acquire("expired-token")), INVALID);
   EXPECT_EQ(Validate(Acquire("early-token")), INVALID);
   EXPECT_EQ(Validate(Acquire("wrong-signer")), INVALID);

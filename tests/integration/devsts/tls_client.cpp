@@ -64,8 +64,8 @@ int Connect(int port, bool v6) {
   return descriptor;
 }
 
-/// The number behind `field` in the head; 0 for none.
-std::size_t NumberBehind(std::string_view head, std::string_view field) {
+/// The number after `field` in the head; 0 when there is none.
+std::size_t NumberAfter(std::string_view head, std::string_view field) {
   std::size_t number = 0;
   const std::size_t at = head.find(field);
   if (at != std::string_view::npos) {
@@ -134,8 +134,8 @@ HttpAnswer TlsClient::Receive() {
   }
   answer.head = m_ahead.substr(0, end + 2);
   m_ahead.erase(0, end + 4);
-  answer.status = static_cast<int>(NumberBehind(answer.head, "HTTP/1.1 "));
-  const std::size_t length = NumberBehind(answer.head, "\r\nContent-Length: ");
+  answer.status = static_cast<int>(NumberAfter(answer.head, "HTTP/1.1 "));
+  const std::size_t length = NumberAfter(answer.head, "\r\nContent-Length: ");
   while (m_ahead.size() < length && ReadSome()) {
   }
   answer.body = m_ahead.substr(0, length);

@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// A blocking HTTPS client on OpenSSL alone, so that a test sends exactly the bytes that it wants to send.
+/// A blocking HTTPS client that uses only OpenSSL, so that a test can send exactly the bytes that it wants.
 
 #pragma once
 
@@ -31,7 +31,7 @@ public:
 
   void Send(std::string_view bytes);
 
-  /// Whether the service ends the connection, which is waited for; whatever it sends before is dropped.
+  /// Waits until the service ends the connection, and drops what it sends before. Returns whether it did end.
   bool IsEnded();
 
   int GetDescriptor() const noexcept { return m_descriptor; }
@@ -49,7 +49,7 @@ public:
 
   void Send(std::string_view bytes);
 
-  /// The next answer, its body as long as its Content-Length says, or cut where the service has ended the connection.
+  /// The next answer. Its body is as long as the Content-Length, or shorter when the service has ended the connection.
   HttpAnswer Receive();
 
   /// Whether the service has ended the connection. Waits for it to send something or to end.

@@ -44,7 +44,7 @@ constexpr const char *OF_PARENT = "The connection belongs to the process that th
 
 /// Sends back what comes, until the client ends.
 void Echo(ServerConnection &connection) {
-  connection.ShakeHands();
+  connection.Handshake();
   for (std::string bytes = connection.ReadSome(); !bytes.empty(); bytes = connection.ReadSome()) {
     connection.Write(bytes);
   }
@@ -262,11 +262,11 @@ protected:
 TEST_P(TlsAfterFork, TheChildLeavesTheParentsConnectionAlone) {
   const ServerProcess server(Echo, Settings());
   auto client = std::make_unique<TlsClient>(CreateTrustingContext(), server.GetPort());
-  ASSERT_EQ(client->ShakeHands(), "");
+  ASSERT_EQ(client->Handshake(), "");
   EXPECT_EQ(RunInChild([&] {
               EXPECT_EQ(client->Write("child"), OF_PARENT);
               EXPECT_EQ(client->Read(), OF_PARENT);
-              EXPECT_EQ(client->ShakeHands(), OF_PARENT);
+              EXPECT_EQ(client->Handshake(), OF_PARENT);
               client->GetStream()->Close();
               EXPECT_TRUE(Testing::DrainIoThreads());
             }),
@@ -282,7 +282,7 @@ TEST_P(TlsAfterFork, AContextOfTheParentServesTheChildWithoutAnySessionOfThePare
   const auto countSessions = [&] { return dynamic_cast<Ssl::SSLContextImpl &>(*context).GetSessions().GetSize(); };
   const auto connect = [&](bool resumed) {
     TlsClient client(context, server.GetPort());
-    EXPECT_EQ(client.ShakeHands(), "");
+    EXPECT_EQ(client.Handshake(), "");
     EXPECT_EQ(client.Write("hello"), "");
     EXPECT_EQ(client.Read(), "hello");
     EXPECT_EQ(client.GetStream()->WasResumed(), resumed);
@@ -293,7 +293,7 @@ TEST_P(TlsAfterFork, AContextOfTheParentServesTheChildWithoutAnySessionOfThePare
   ASSERT_GT(sessions, 0u);
   const auto connectAndStay = [&] {
     auto open = std::make_unique<TlsClient>(context, server.GetPort());
-    EXPECT_EQ(open->ShakeHands(), "");
+    EXPECT_EQ(open->Handshake(), "");
     EXPECT_EQ(open->Write("hello"), "");
     EXPECT_EQ(open->Read(), "hello");
     return open;
@@ -330,12 +330,12 @@ thread_local ChildEnder ender;
 TEST_P(TlsAfterFork, AHandlerThatForksIsTheLastToBeCalledInTheChild) {
   const ServerProcess silent(
       [](ServerConnection &connection) {
-        connection.ShakeHands();
+        connection.Handshake();
         connection.WaitForInterrupt();
       },
       Settings());
   TlsClient client(CreateTrustingContext(), silent.GetPort());
-  ASSERT_EQ(client.ShakeHands(), "");
+  ASSERT_EQ(client.Handshake(), "");
   const Shared<std::atomic<int>> calls;
   pid_t child = -1;
   const auto note = [&](std::size_t, const Exception *) {
@@ -370,7 +370,7 @@ TEST(TlsUnderLoad, EachChildOfABusyParentConnects) {
   const auto work = [&] {
     while (!stop) {
       TlsClient client(context, server.GetPort());
-      EXPECT_EQ(client.ShakeHands(), "");
+      EXPECT_EQ(client.Handshake(), "");
       client.GetStream()->Close();
     }
   };
@@ -379,7 +379,7 @@ TEST(TlsUnderLoad, EachChildOfABusyParentConnects) {
   for (int i = 0; i < 20; ++i) {
     EXPECT_EQ(RunInChild([&] {
                 TlsClient client(context, server.GetPort());
-                EXPECT_EQ(client.ShakeHands(), "");
+                EXPECT_EQ(client.Handshake(), "");
                 EXPECT_EQ(client.Write("hello"), "");
                 EXPECT_EQ(client.Read(), "hello");
               }),

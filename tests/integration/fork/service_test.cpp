@@ -62,7 +62,7 @@ public:
 
 private:
   void Serve(ServerConnection &peer) const {
-    if (m_isSecure && !peer.ShakeHands()) {
+    if (m_isSecure && !peer.Handshake()) {
       return;
     }
     if (peer.ReadRequest().find("slow@corp.example") != std::string::npos) {

@@ -142,7 +142,7 @@ TEST(Credentials, AreNoneOnceTheNegotiationHasFailed) {
   EXPECT_THROW(handler->NegotiateLeg({}), GssCredentialException);
   world.LogIn();
   EXPECT_THROWS_MESSAGE(handler->NegotiateLeg({}), Tarvel::InvalidStateException,
-                        "The negotiation with sts@localhost has failed before");
+                        "The negotiation with sts@localhost has already failed");
 }
 
 TEST(Credentials, AreReportedAsRefusedCredentialsAreEverywhere) {

@@ -2,8 +2,8 @@
 
 #include "integration/gssapi/gss_acceptor.h"
 
+#include "gss_name.h"
 #include "gss_status.h"
-#include "mechanism.h"
 
 #include <gssapi/gssapi_ext.h>
 

@@ -49,7 +49,7 @@ namespace {
 TEST(Mechanism, ThatTakesNotTheNameMakesItABadArgument) {
   g_takesNoNames = true;
   EXPECT_THROWS_MESSAGE(CreateSpnegoHandler(Testing::SettingsFor()), Tarvel::InvalidArgumentException,
-                        "Invalid argument : 'sts@localhost' is no name: An invalid name was supplied");
+                        "Invalid argument : 'sts@localhost' is not a valid name: An invalid name was supplied");
   g_takesNoNames = false;
 }
 
@@ -61,7 +61,7 @@ TEST(Mechanism, ThatDoesWithoutMutualAuthenticationIsNotGoodEnough) {
   const Testing::Bytes finalLeg = service.Accept(*handler->NegotiateLeg({}));
   g_forgetsMutualAuthentication = true;
   EXPECT_THROWS_MESSAGE(handler->NegotiateLeg(finalLeg), GssNegotiationException,
-                        "The service sts@localhost was not authenticated: the mechanism did without");
+                        "The service sts@localhost was not authenticated: the mechanism does not support it");
   g_forgetsMutualAuthentication = false;
   EXPECT_FALSE(handler->IsMutuallyAuthenticated());
 }

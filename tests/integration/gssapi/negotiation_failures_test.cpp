@@ -135,7 +135,7 @@ TEST_P(NegotiationWithABadLeg, FailsForGood) {
                           "The negotiation with sts@localhost failed: ", "");
   EXPECT_FALSE(handler->IsMutuallyAuthenticated());
   EXPECT_THROWS_MESSAGE(handler->NegotiateLeg(GetParam().leg), Tarvel::InvalidStateException,
-                        "The negotiation with sts@localhost has failed before");
+                        "The negotiation with sts@localhost has already failed");
 }
 
 INSTANTIATE_TEST_SUITE_P(

@@ -60,18 +60,21 @@ TEST_F(OpenNegotiations, RememberWhatTheFirstLegAskedForUntilTheLast) {
 }
 
 TEST_F(OpenNegotiations, RefuseALegOfNone) {
-  EXPECT_THROWS_MESSAGE(m_negotiations.Continue("c", GO_ON), Refusal, "no negotiation of that context waits for a leg");
+  EXPECT_THROWS_MESSAGE(m_negotiations.Continue("c", GO_ON), Refusal,
+                        "no negotiation with that context is waiting for a leg");
 }
 
 TEST_F(OpenNegotiations, RefuseALegOfOneThatHasEnded) {
   m_negotiations.Begin("c", END, {});
-  EXPECT_THROWS_MESSAGE(m_negotiations.Continue("c", GO_ON), Refusal, "no negotiation of that context waits for a leg");
+  EXPECT_THROWS_MESSAGE(m_negotiations.Continue("c", GO_ON), Refusal,
+                        "no negotiation with that context is waiting for a leg");
 }
 
 TEST_F(OpenNegotiations, ForgetOneWhoseLegIsRefused) {
   m_negotiations.Begin("c", GO_ON, {});
   EXPECT_THROWS_MESSAGE(m_negotiations.Continue("c", BAD), Refusal, "bad leg");
-  EXPECT_THROWS_MESSAGE(m_negotiations.Continue("c", GO_ON), Refusal, "no negotiation of that context waits for a leg");
+  EXPECT_THROWS_MESSAGE(m_negotiations.Continue("c", GO_ON), Refusal,
+                        "no negotiation with that context is waiting for a leg");
 }
 
 TEST_F(OpenNegotiations, ForgetOneAfterAMinute) {
@@ -79,13 +82,14 @@ TEST_F(OpenNegotiations, ForgetOneAfterAMinute) {
   m_now += seconds(60);
   EXPECT_NO_THROW(m_negotiations.Continue("c", GO_ON));
   m_now += seconds(1);
-  EXPECT_THROWS_MESSAGE(m_negotiations.Continue("c", GO_ON), Refusal, "no negotiation of that context waits for a leg");
+  EXPECT_THROWS_MESSAGE(m_negotiations.Continue("c", GO_ON), Refusal,
+                        "no negotiation with that context is waiting for a leg");
 }
 
 TEST_F(OpenNegotiations, RefuseAContextThatIsTaken) {
   m_negotiations.Begin("c", GO_ON, {});
   EXPECT_THROWS_MESSAGE(m_negotiations.Begin("c", GO_ON, {}), Refusal,
-                        "a negotiation of that context has begun already");
+                        "a negotiation with that context has already begun");
   EXPECT_NO_THROW(m_negotiations.Continue("c", GO_ON));
 }
 
@@ -93,7 +97,7 @@ TEST_F(OpenNegotiations, AreAHundredAtMost) {
   for (int i = 0; i < 100; ++i) {
     m_negotiations.Begin(std::to_string(i), GO_ON, {});
   }
-  EXPECT_THROWS_MESSAGE(m_negotiations.Begin("c", GO_ON, {}), Refusal, "too many negotiations have not ended");
+  EXPECT_THROWS_MESSAGE(m_negotiations.Begin("c", GO_ON, {}), Refusal, "too many unfinished negotiations");
   m_now += seconds(61);
   EXPECT_NO_THROW(m_negotiations.Begin("c", GO_ON, {}));
 }

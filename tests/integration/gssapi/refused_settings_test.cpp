@@ -38,7 +38,7 @@ TEST_P(RefusedSettings, RaiseAnInvalidArgument) {
 
 BadSetting BadService(const std::string &name, const std::string &service) {
   return {name, [service](SpnegoSettings &settings) { settings.service = service; },
-          "'" + service + "' is no service, as HTTP@host or HTTP/host@REALM"};
+          "'" + service + "' is not a service name such as HTTP@host or HTTP/host@REALM"};
 }
 
 const std::string NULL_CHARACTER("a\0b", 3);
@@ -51,7 +51,7 @@ INSTANTIATE_TEST_SUITE_P(
         BadService("PrincipalWithoutHost", "sts/"), BadService("PrincipalWithoutName", "/localhost@EXAMPLE.TEST"),
         BadSetting{"ServiceOf2000Characters", [](SpnegoSettings &settings) { settings.service.assign(2000, 'x'); },
                    "'" + std::string(1024, 'x') +
-                       "... (976 more bytes)' is no service, as HTTP@host or HTTP/host@REALM"},
+                       "... (976 more bytes)' is not a service name such as HTTP@host or HTTP/host@REALM"},
         BadSetting{"NullInService", [](SpnegoSettings &settings) { settings.service += NULL_CHARACTER; },
                    "A GSS setting contains a null character"},
         BadSetting{"NullInClient", [](SpnegoSettings &settings) { settings.client = NULL_CHARACTER; },

@@ -1,5 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
-// Which descriptions an operation computes, and with which values a service's client is made.
+// Counts the descriptions that an operation computes, and checks the values with which a service's client is made.
 #include "support/counting_token.h"
 #include "support/data_file.h"
 #include "support/posting_server.h"
@@ -37,7 +37,7 @@ std::vector<ClientValues> g_clients;
 
 } // namespace
 
-// The linker calls these in place of the library's functions, which it leaves reachable under the names with "__real_".
+// The linker redirects calls of the library's functions to these; the originals have the names with "__real_".
 
 #define ARGUMENTS "RKNSt7__cxx1112basic_stringIcSt11char_traitsIcESaIcEEERKN6Tarvel3RefINS9_3Ssl10SSLContextEEES8_l"
 #define WRITE_TOKEN_SPEC "_ZN9SsoClient14WriteTokenSpecB5cxx11ERKNS_9TokenSpecE"
@@ -87,8 +87,8 @@ using Testing::SpecFor;
 struct DescribingOperation {
   const char *name;
   const char *responseBegin;
-  int specs;  ///< how many descriptions of specs a success takes
-  int tokens; ///< how many of tokens, that of the new token included
+  int specs;  ///< how many descriptions of specs a successful operation computes
+  int tokens; ///< how many descriptions of tokens, including that of the new token
   std::function<void(const SecurityTokenService &)> run;
 };
 
@@ -99,7 +99,7 @@ void PrintTo(const DescribingOperation &operation, std::ostream *out) {
 class Descriptions : public testing::TestWithParam<DescribingOperation> {
 protected:
   void RunAtLevel(int level) const {
-    const Testing::RecordedLog log; // a line is formatted only when somebody takes it
+    const Testing::RecordedLog log; // a line is formatted only when a sink receives it
     const Testing::ScopedLogLevel scope(level);
     g_specDescriptions = g_tokenDescriptions = 0;
     const std::string begin = GetParam().responseBegin;

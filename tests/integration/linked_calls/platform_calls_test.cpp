@@ -1,5 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
-// With which values the library calls the platform and its own factories, where no caller can see them.
+// Checks the values with which the library calls the platform and its own factories, where no caller can see them.
+
 #include "support/parsed_document.h"
 #include "support/throws_message.h"
 #include "transport/https_client.h"
@@ -28,7 +29,7 @@ using ContextRef = Ref<Tarvel::Ssl::SSLContext>;
 
 std::vector<std::string> g_specs; ///< "FACTORY HOST:PORT FLAG" for each call
 std::vector<std::string> g_algorithms;
-Ref<UserAgent> g_userAgent; ///< handed out in place of a real one, unless it is null
+Ref<UserAgent> g_userAgent; ///< returned instead of a real one, unless it is null
 
 void NoteSpec(const char *factory, const std::string &host, int port, bool flag) {
   g_specs.push_back(std::string(factory) + " " + host + ":" + std::to_string(port) + (flag ? " true" : " false"));
@@ -36,7 +37,7 @@ void NoteSpec(const char *factory, const std::string &host, int port, bool flag)
 
 } // namespace
 
-// The linker calls these in place of the library's functions, which it leaves reachable under the names with "__real_".
+// The linker redirects calls of the library's functions to these; the originals have the names with "__real_".
 
 #define TEXT "NSt7__cxx1112basic_stringIcSt11char_traitsIcESaIcEEE"
 #define MAKE_SPEC "_ZN9SsoClient23CreateSsoConnectionSpecERK" TEXT "ibRN6Tarvel3RefINS8_4Http14ConnectionSpecEEE"
@@ -96,7 +97,7 @@ namespace {
 
 using Texts = std::vector<std::string>;
 
-/// The specs that are made for a client of `url`, with the flag or without one.
+/// The specifications that are made for a client of `url`, with the flag or without it.
 class SpecsOfAClient {
 public:
   explicit SpecsOfAClient(const std::string &url) : m_url(url) {}
@@ -117,30 +118,30 @@ private:
   const ContextRef m_context = Tarvel::Ssl::CreateSSLContext();
 };
 
-TEST(HttpsClient, HandsItsFlagToTheFactoryOfSslConnections) {
+TEST(HttpsClient, PassesItsFlagToTheFactoryOfSslConnections) {
   const SpecsOfAClient specs("https://sts.example:7444/STS");
   EXPECT_EQ(specs.With(true), Texts{"ssl sts.example:7444 true"});
   EXPECT_EQ(specs.With(false), Texts{"ssl sts.example:7444 false"});
 }
 
-TEST(HttpsClient, HandsItsFlagToTheFactoryOfPlainConnections) {
+TEST(HttpsClient, PassesItsFlagToTheFactoryOfPlainConnections) {
   const SpecsOfAClient specs("http://sts.example:7080/STS");
   EXPECT_EQ(specs.With(true), Texts{"plain sts.example:7080 true"});
   EXPECT_EQ(specs.With(false), Texts{"plain sts.example:7080 false"});
 }
 
-TEST(HttpsClient, HasNoFlagWhenNoneIsGiven) {
+TEST(HttpsClient, PassesNoFlagByDefault) {
   EXPECT_EQ(SpecsOfAClient("https://sts.example/STS").WithoutFlag(), Texts{"ssl sts.example:443 false"});
   EXPECT_EQ(SpecsOfAClient("http://sts.example/STS").WithoutFlag(), Texts{"plain sts.example:80 false"});
 }
 
-TEST(CanonicalElementText, AsksForTheAlgorithmByItsNameWithANumberSign) {
+TEST(CanonicalElementText, RequestsTheAlgorithmByItsNameWithANumberSign) {
   g_algorithms.clear();
   EXPECT_EQ(CanonicalElementText(Testing::ParsedDocument("<a b=\"c\"/>").Root()), "<a b=\"c\"></a>");
   EXPECT_EQ(g_algorithms, Texts{"http://www.w3.org/TR/2001/REC-xml-c14n-20010315#"});
 }
 
-/// Starts every request, and has run out of memory by the time when somebody waits for it.
+/// Starts every request, and has run out of memory when the caller waits for it.
 class ExhaustedUserAgent final : public UserAgent {
 public:
   void StartRequest(const Ref<Tarvel::Http::ClientRequest> &, CompletionFunction,
@@ -151,7 +152,7 @@ public:
   }
 };
 
-TEST(HttpsSession, LetsExceptionsOfOtherKindsPassAsTheyAre) {
+TEST(HttpsSession, PassesOnExceptionsOfOtherKindsUnchanged) {
   g_userAgent = Tarvel::MakeRef<ExhaustedUserAgent>();
   const auto session = HttpsClient("http://sts.example/STS", nullptr, "", 1000000).CreateSession();
   g_userAgent = nullptr;

@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
-// Every wrong answer of the development service to a negotiation by Kerberos ticket, in both its forms: the class and the
-// whole message of the exception, and that the next negotiation succeeds.
+// Every wrong answer of the development service to a negotiation by Kerberos ticket, in both forms of negotiation:
+// checks the class and the whole message of the exception, and that the next negotiation succeeds.
 #include "integration/gssapi/service_world.h"
 #include "integration/service/wrong_answers.h"
 
@@ -21,8 +21,8 @@ using Testing::WrongAnswer;
 
 struct Form {
   const char *name;
-  /// Whether a token that is not as it must be is reported as `ParseException`, and not as `SsoException`.
-  bool raisesParseException;
+  /// Whether a wrong token is reported as `ParseException`, and not as `SsoException`.
+  bool throwsParseException;
   std::function<std::string(const SecurityTokenServiceConfig &)> negotiate;
 };
 
@@ -45,9 +45,9 @@ const Form FORMS[] = {
      }},
 };
 
-class EachFormAnsweredWrongly : public testing::TestWithParam<Form> {
+class EachFormOfNegotiationAnsweredWrongly : public testing::TestWithParam<Form> {
 protected:
-  /// How a negotiation ends whose first message is answered with the fault, and how the one after it.
+  /// How a negotiation ends whose first message gets the wrong answer, and how the next negotiation ends.
   std::string OutcomesOf(const std::string &fault) const {
     const SecurityTokenServiceConfig config = m_world.MakeConfig(fault + "/once/" + GetParam().name);
     const auto negotiate = [&] { return GetParam().negotiate(config); };
@@ -60,33 +60,33 @@ protected:
 
 constexpr char THEN_A_TOKEN[] = "; then alice@corp.example";
 
-TEST_P(EachFormAnsweredWrongly, ReportsItAndNegotiatesAfterwards) {
+TEST_P(EachFormOfNegotiationAnsweredWrongly, ReportsTheAnswerAndNegotiatesAfterwards) {
   for (const WrongAnswer &answer : Testing::TO_ALL) {
     if (answer.fault == std::string("wrong-wrapper")) {
-      continue; // without the collection it is a leg in the middle, see below
+      continue; // without the collection it looks like a leg that is not the last, see below
     }
     EXPECT_EQ(OutcomesOf(answer.fault), std::string(answer.outcome) + THEN_A_TOKEN) << answer.fault;
   }
 }
 
-TEST_P(EachFormAnsweredWrongly, HandsOutNoWrongTokenAndNegotiatesAfterwards) {
+TEST_P(EachFormOfNegotiationAnsweredWrongly, RefusesAWrongTokenAndNegotiatesAfterwards) {
   const std::string service = "SsoException: ";
   for (const WrongAnswer &answer : Testing::INSTEAD_OF_A_TOKEN) {
     std::string outcome = answer.outcome;
-    if (GetParam().raisesParseException && outcome.rfind(service, 0) == 0) {
+    if (GetParam().throwsParseException && outcome.rfind(service, 0) == 0) {
       outcome.replace(0, service.size(), "ParseException: ");
     }
     EXPECT_EQ(OutcomesOf(answer.fault), outcome + THEN_A_TOKEN) << answer.fault;
   }
 }
 
-// The token in it does not count, and the service knows of no further leg.
-TEST_P(EachFormAnsweredWrongly, GoesOnWhenTheFinalLegStandsOutsideItsCollection) {
+// The token in that leg is ignored, and the service expects no further leg.
+TEST_P(EachFormOfNegotiationAnsweredWrongly, ContinuesWhenTheFinalLegIsOutsideItsCollection) {
   EXPECT_EQ(OutcomesOf("wrong-wrapper"),
             std::string("SsoException: Unexpected SOAP fault: wst:InvalidRequest; request failed.") + THEN_A_TOKEN);
 }
 
-INSTANTIATE_TEST_SUITE_P(Negotiation, EachFormAnsweredWrongly, testing::ValuesIn(FORMS),
+INSTANTIATE_TEST_SUITE_P(Negotiation, EachFormOfNegotiationAnsweredWrongly, testing::ValuesIn(FORMS),
                          [](const auto &form) { return std::string(form.param.name); });
 
 } // namespace

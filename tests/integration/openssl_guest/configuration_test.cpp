@@ -39,7 +39,7 @@ protected:
 
   /// What the host says, whose server is as `settings` say.
   std::string Run(const TlsSettings &settings, const Deeds &deeds, const std::string &configuration) {
-    ScriptedServer server([](ServerConnection &connection) { connection.ShakeHands(); }, settings);
+    ScriptedServer server([](ServerConnection &connection) { connection.Handshake(); }, settings);
     return HostProcess(server.GetPort(), deeds, configuration).Finish();
   }
 

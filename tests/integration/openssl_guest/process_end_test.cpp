@@ -39,7 +39,7 @@ TEST(TheEndOfTheProcess, EndsARequestThatWaitsForItsAnswer) {
   for (int i = 0; i < 5; ++i) {
     EXPECT_EQ(RunAgainstSilentServer("ask-service",
                                      [](ServerConnection &connection) {
-                                       connection.ShakeHands();
+                                       connection.Handshake();
                                        connection.ReadRequest();
                                      }),
               "worker: CommunicationException: " + ENDED);
@@ -52,14 +52,14 @@ TEST(TheEndOfTheProcess, EndsAHandshakeThatWaitsForTheServer) {
 }
 
 TEST(TheEndOfTheProcess, EndsAReadThatWaitsForTheServer) {
-  EXPECT_EQ(RunAgainstSilentServer("wait-in-read", [](ServerConnection &connection) { connection.ShakeHands(); }),
+  EXPECT_EQ(RunAgainstSilentServer("wait-in-read", [](ServerConnection &connection) { connection.Handshake(); }),
             "read: InvalidStateException: " + ENDED + "read again: InvalidStateException: " + ENDED);
 }
 
 TEST(TheEndOfTheProcess, RefusesWhatBeginsThen) {
   ScriptedServer server(
       [](ServerConnection &connection) {
-        connection.ShakeHands();
+        connection.Handshake();
         connection.WaitForInterrupt();
       },
       TlsSettings());

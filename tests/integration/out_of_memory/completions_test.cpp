@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
-// A completion must be called however early memory runs out: each allocation of an exchange fails in its turn. All of it
-// runs on the test's thread, in one order.
+// A completion must be called wherever memory runs out: each allocation of an exchange fails in turn. Everything runs on the
+// test's thread, in a fixed order.
 #include "integration/out_of_memory/failing_heap.h"
 #include "transport/https_session.h"
 
@@ -34,7 +34,7 @@ const char ANSWER[] = "HTTP/1.1 200 OK\r\nSet-Cookie: name=value-that-is-too-lon
                       "Transfer-Encoding: chunked\r\n\r\n20\r\n0123456789012345678901234567890\n\r\n0\r\n\r\n";
 const char REFUSAL[] = "HTTP/1.1 503 Not available, for a reason that is too long for the string itself\r\n\r\n";
 
-/// Completes nothing until the test does, and needs no memory of its own for that.
+/// Completes operations when the test says so, and allocates no memory for that.
 class ScriptedStream final : public Stream {
 public:
   explicit ScriptedStream(const char *answer) : m_rest(answer) {}
@@ -101,11 +101,11 @@ struct Outcome {
   int calls = 0;
   bool succeeded = false;
   bool hasFailed = false;      // an allocation
-  bool ranOutOfMemory = false; // by the class, or by the text, for which there may be memory again
+  bool ranOutOfMemory = false; // by the class of the exception or, if there is memory again, by its text
 };
 
-/// Asks with so many allocations that go well; -1 calls when the start itself failed.
-Outcome AskWith(long allocations, Shortage shortage, const char *answer, const Exception *connectFailure) {
+/// Sends a request with that many successful allocations. `calls` is -1 when the start itself failed.
+Outcome SendWith(long allocations, Shortage shortage, const char *answer, const Exception *connectFailure) {
   const Tarvel::System::NetworkException closed("closed");
   const auto stream = Tarvel::MakeRef<ScriptedStream>(answer);
   const auto spec = Tarvel::MakeRef<ScriptedSpec>(stream);
@@ -139,15 +139,15 @@ Outcome AskWith(long allocations, Shortage shortage, const char *answer, const E
   return outcome;
 }
 
-/// Lets memory run out ever later, until it lasts.
+/// Lets memory run out later and later, until there is enough.
 void ExpectOneCallWhereverMemoryRunsOut(Shortage shortage, const char *answer, const Exception *connectFailure,
                                         bool succeeds) {
-  AskWith(NEVER, shortage, answer, connectFailure); // what is made once is made
+  SendWith(NEVER, shortage, answer, connectFailure); // makes what is made once per process
   bool started = false;
   for (long allocations = 0;; ++allocations) {
     SCOPED_TRACE(allocations);
     ASSERT_LT(allocations, 10000);
-    const Outcome outcome = AskWith(allocations, shortage, answer, connectFailure);
+    const Outcome outcome = SendWith(allocations, shortage, answer, connectFailure);
     ASSERT_TRUE(outcome.calls == 1 || (!started && outcome.calls == -1)) << outcome.calls;
     started = outcome.calls == 1;
     if (!outcome.hasFailed) {
@@ -166,15 +166,15 @@ TEST_P(SendRequestAsync, CallsItsCompletionOnceWhereverMemoryRunsOut) {
   ExpectOneCallWhereverMemoryRunsOut(GetParam(), ANSWER, nullptr, true);
 }
 
-TEST_P(SendRequestAsync, CallsItsCompletionOnceWhereverMemoryRunsOutOverARefusedStatus) {
+TEST_P(SendRequestAsync, CallsItsCompletionOnceWhereverMemoryRunsOutWithARefusedStatus) {
   ExpectOneCallWhereverMemoryRunsOut(GetParam(), REFUSAL, nullptr, false);
 }
 
-TEST_P(SendRequestAsync, CallsItsCompletionOnceWhereverMemoryRunsOutOverABadResponse) {
+TEST_P(SendRequestAsync, CallsItsCompletionOnceWhereverMemoryRunsOutWithABadResponse) {
   ExpectOneCallWhereverMemoryRunsOut(GetParam(), "220 mail.example ESMTP\r\n", nullptr, false);
 }
 
-TEST_P(SendRequestAsync, CallsItsCompletionOnceWhereverMemoryRunsOutOverAFailedConnect) {
+TEST_P(SendRequestAsync, CallsItsCompletionOnceWhereverMemoryRunsOutWithAFailedConnect) {
   const Tarvel::System::NetworkException failure("a text that is too long for the string itself, by some characters");
   ExpectOneCallWhereverMemoryRunsOut(GetParam(), ANSWER, &failure, false);
 }

@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// The heap of C++, which runs out when a test says so.
+/// A heap for C++ that runs out of memory when a test says so.
 
 #pragma once
 
@@ -8,7 +8,7 @@
 
 namespace Testing {
 
-/// While it lives, `allocations` more of the calling thread succeed, and the next one fails.
+/// While it lives, the next `allocations` allocations of the calling thread succeed, and the one after them fails.
 class FailingHeap {
 public:
   FailingHeap(long allocations, Shortage shortage) noexcept;
@@ -23,7 +23,7 @@ public:
   bool HasFailed() const noexcept;
 };
 
-/// Allocations of all threads that have not been given back.
+/// The number of allocations of all threads that have not been freed.
 long CountHeapAllocations() noexcept;
 
 } // namespace Testing

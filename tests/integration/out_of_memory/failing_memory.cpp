@@ -12,12 +12,12 @@ namespace Testing {
 
 namespace {
 
-std::atomic<long> g_left{0}; // until one fails; 0 for none that does
-std::atomic<bool> g_goesOn{false};
+std::atomic<long> g_left{0}; // until one fails; 0 if none is to fail
+std::atomic<bool> g_keepsFailing{false};
 std::atomic<bool> g_hasFailed{false};
 std::atomic<long> g_live{0};
 
-/// As `malloc` does it.
+/// Whether this allocation fails; sets errno as `malloc` does.
 bool Fails() noexcept {
   if (g_left.load() <= 0) {
     return false;
@@ -25,7 +25,7 @@ bool Fails() noexcept {
   if (g_left.fetch_sub(1) != 1) {
     return false;
   }
-  if (g_goesOn) {
+  if (g_keepsFailing) {
     g_left = 1;
   }
   g_hasFailed = true;
@@ -74,12 +74,12 @@ FailingMemory::FailingMemory(int number, Shortage shortage) {
     std::abort();
   }
   g_hasFailed = false;
-  g_goesOn = shortage == Shortage::FROM_THEN;
+  g_keepsFailing = shortage == Shortage::FROM_THEN;
   g_left = number;
 }
 
 FailingMemory::~FailingMemory() {
-  g_goesOn = false;
+  g_keepsFailing = false;
   g_left = 0;
 }
 

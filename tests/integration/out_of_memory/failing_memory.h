@@ -7,11 +7,11 @@
 namespace Testing {
 
 enum class Shortage {
-  ONCE,      ///< one allocation fails, and the next finds memory again
-  FROM_THEN, ///< and so do all that follow
+  ONCE,      ///< one allocation fails, later ones succeed
+  FROM_THEN, ///< one allocation fails, and so do all later ones
 };
 
-/// While it lives, the `number`th allocation from now on, counted from 1, fails, whatever thread makes it.
+/// While it lives, the `number`th allocation from now on, counted from 1, fails, on any thread.
 class FailingMemory {
 public:
   FailingMemory(int number, Shortage shortage);
@@ -23,7 +23,7 @@ public:
   bool HasFailed() const noexcept;
 };
 
-/// Allocations of OpenSSL that have not been given back.
+/// The number of OpenSSL's allocations that have not been freed.
 long CountForeignAllocations();
 
 } // namespace Testing

@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
-// Whatever allocation of C++ fails while a document is read or a token verified: the call succeeds all the same, ends with
-// the verdict that it has with enough memory, or throws `std::bad_alloc`.
+// Whichever allocation of C++ fails while a document is read or a token is verified: the call either has the same result as
+// with enough memory or throws `std::bad_alloc`.
 #include "integration/out_of_memory/failing_heap.h"
 #include "support/data_file.h"
 
@@ -56,7 +56,7 @@ std::map<std::string, int> Sweep(const std::function<void()> &operation, Shortag
 /// `full` is the outcome with enough memory.
 void ExpectNothingElse(const std::function<void()> &operation, const std::string &full) {
   FailingHeap none(1'000'000, Shortage::ONCE);
-  ASSERT_EQ(OutcomeOf(operation, none), full); // what is made once in the life of the process is there now
+  ASSERT_EQ(OutcomeOf(operation, none), full); // makes what is made once per process
   for (const Shortage shortage : {Shortage::ONCE, Shortage::FROM_THEN}) {
     SCOPED_TRACE(shortage == Shortage::ONCE ? "once" : "from then on");
     const long before = Testing::CountHeapAllocations();
@@ -77,7 +77,7 @@ std::function<void()> Parse(const std::string &xml) {
   };
 }
 
-/// Many of each that the parser keeps account of, so that it needs memory for them often.
+/// Many of everything that the parser keeps lists of, so that it often allocates memory for them.
 std::string DocumentOfMany() {
   std::string xml;
   for (int depth = 0; depth < 100; ++depth) {
@@ -94,12 +94,12 @@ std::string DocumentOfMany() {
   return xml;
 }
 
-TEST(HeapThatRunsOut, IsReportedByTheParser) {
+TEST(OutOfHeap, IsReportedByTheParser) {
   ExpectNothingElse(Parse(ReadDataFile("tokens/full.xml")), "done");
   ExpectNothingElse(Parse(DocumentOfMany()), "done");
 }
 
-TEST(HeapThatRunsOut, IsNotTakenForAFaultOfTheDocument) {
+TEST(OutOfHeap, IsNotReportedAsAFaultOfTheDocument) {
   const std::string xml = DocumentOfMany();
   ExpectNothingElse(Parse(xml + "x"), "something other than comments and processing instructions follows the document "
                                       "element at line 1, column " +
@@ -111,12 +111,12 @@ std::function<void()> Verification(const std::string &xml, const std::string &ce
   return [xml, trusted] { SsoClient::CreateSamlToken(xml, trusted); };
 }
 
-TEST(HeapThatRunsOut, IsNoVerdictOnAGenuineToken) {
+TEST(OutOfHeap, NeverCausesAGenuineTokenToBeRefused) {
   ExpectNothingElse(Verification(ReadDataFile("tokens/full.xml"), "sts-rsa"), "done");
   ExpectNothingElse(Verification(ReadDataFile("tokens/holder-of-key.xml"), "sts-rsa"), "done");
 }
 
-TEST(HeapThatRunsOut, NeverHasATamperedTokenAccepted) {
+TEST(OutOfHeap, NeverCausesATamperedTokenToBeAccepted) {
   std::string xml = ReadDataFile("tokens/bearer.xml");
   xml.replace(xml.find("alice"), 5, "malory");
   ExpectNothingElse(Verification(xml, "sts-rsa"), "Failed to verify signature: token might have been tampered with.");

@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
-// Whatever allocation of OpenSSL fails: an operation succeeds all the same, or says that there is no memory. It
-// never answers, or reports a fault of what it was given.
+// Whichever allocation of OpenSSL fails: an operation either succeeds or reports that there is no memory. It never has a
+// wrong result, and never reports a fault of its input.
 #include "integration/out_of_memory/failing_memory.h"
 #include "support/completion.h"
 #include "support/data_file.h"
@@ -73,12 +73,12 @@ void ExpectNothingElse(const std::function<void()> &operation, const std::string
   }
 }
 
-/// Each failure that loses memory is one of hundreds.
+/// Checks for leaks too: each failure that leaks memory is one of hundreds.
 class OutOfMemory : public testing::Test {
 protected:
   void ExpectNothingElse(const std::function<void()> &operation, const std::string &full = "done", int step = 1) {
     ASSERT_EQ(OutcomeOf(operation), full);
-    ASSERT_EQ(OutcomeOf(operation), full); // what is looked up once in the life of the process is there now
+    ASSERT_EQ(OutcomeOf(operation), full); // makes what is made once per process
     const long before = Testing::CountForeignAllocations();
     ::ExpectNothingElse(operation, full, step);
     EXPECT_LE(Testing::CountForeignAllocations() - before, 64); // caches that fill up
@@ -98,7 +98,7 @@ std::function<void()> Verification(const std::string &xml, const std::string &ce
   return [xml, trusted] { SsoClient::CreateSamlToken(xml, trusted); };
 }
 
-TEST_F(OutOfMemory, IsNoVerdictOnAGenuineToken) {
+TEST_F(OutOfMemory, NeverCausesAGenuineTokenToBeRefused) {
   for (const char *const name : {"bearer", "holder-of-key", "rsa-pss-sha256"}) {
     SCOPED_TRACE(name);
     ExpectNothingElse(Verification(Token(name), "sts-rsa"));
@@ -106,7 +106,7 @@ TEST_F(OutOfMemory, IsNoVerdictOnAGenuineToken) {
   ExpectNothingElse(Verification(Token("ecdsa-p256-sha256"), "sts-ec256"));
 }
 
-TEST_F(OutOfMemory, NeverHasATamperedTokenAccepted) {
+TEST_F(OutOfMemory, NeverCausesATamperedTokenToBeAccepted) {
   for (const char *const name : {"bearer", "rsa-pss-sha256"}) {
     SCOPED_TRACE(name);
     ExpectNothingElse(Verification(Changed(Token(name)), "sts-rsa"), TAMPERED);
@@ -115,7 +115,7 @@ TEST_F(OutOfMemory, NeverHasATamperedTokenAccepted) {
   ExpectNothingElse(Verification(Changed(Token("ecdsa-p256-sha256")), "sts-ec256"), TAMPERED);
 }
 
-TEST_F(OutOfMemory, IsReportedByVerificationWithAKeyThatIsUsedForTheFirstTime) {
+TEST_F(OutOfMemory, IsReportedByVerificationOnTheFirstUseOfAKey) {
   const std::string pem = ReadDataFile("tokens/sts-rsa.crt");
   const std::string xml = Token("bearer");
   ExpectNothingElse([&] { SsoClient::CreateSamlToken(xml, {Tarvel::Crypto::CreateCertificateFromPem(pem)}); });
@@ -135,7 +135,7 @@ TEST_F(OutOfMemory, IsReportedByCertificates) {
 
 TEST_F(OutOfMemory, IsReportedByPrivateKeys) {
   const auto answer = [] { return std::string("open sesame"); };
-  // A passphrase takes its time, once for each allocation that fails.
+  // Each try derives a key from the passphrase, which is slow.
   for (const auto &[name, step] : std::map<std::string, int>{{"p256.key", 1},
                                                              {"p256.key.der", 1},
                                                              {"rsa2048-traditional.key", 1},
@@ -197,6 +197,28 @@ void Require(const Testing::Completion &completion) {
   throw std::runtime_error(completion.GetMessage());
 }
 
+/// Connects to the service and sends a request, to another endpoint each time, so that no session is resumed.
+void Exchange(Tarvel::Ssl::SSLContext &context, int port) {
+  static int endpoints = 0;
+  const std::string request = "GET / HTTP/1.1\r\nHost: localhost\r\nConnection: close\r\n\r\n";
+  const auto socket = Tarvel::System::CreateTcpClientSocket();
+  Testing::Completion connected;
+  socket->AsyncConnect("127.0.0.1", port, connected.ForEnd());
+  Require(connected);
+  const auto stream = context.CreateStream(socket, std::to_string(++endpoints));
+  Testing::Completion handshake;
+  stream->AsyncHandshake("localhost", "", handshake.ForEnd());
+  Require(handshake);
+  Testing::Completion written;
+  stream->AsyncWrite(request.data(), request.size(), written.ForTransfer());
+  Require(written);
+  char buffer[16384];
+  Testing::Completion read;
+  stream->AsyncReadSome(buffer, sizeof buffer, read.ForTransfer());
+  Require(read);
+  stream->Close();
+}
+
 TEST_F(OutOfMemory, IsReportedByHandshakesReadsAndWrites) {
   const Testing::DevSts service;
   Ref<Tarvel::Ssl::SSLContext> context;
@@ -204,29 +226,9 @@ TEST_F(OutOfMemory, IsReportedByHandshakesReadsAndWrites) {
     context = Tarvel::Ssl::CreateSSLContext();
     context->TrustFile(service.PathOf("authority.crt"));
   };
-  const std::string request = "GET / HTTP/1.1\r\nHost: localhost\r\nConnection: close\r\n\r\n";
-  const auto exchange = [&] {
-    const auto socket = Tarvel::System::CreateTcpClientSocket();
-    Testing::Completion connected;
-    socket->AsyncConnect("127.0.0.1", service.GetPort(), connected.ForEnd());
-    Require(connected);
-    // Another endpoint each time, so that no session is resumed.
-    static int endpoints = 0;
-    const auto stream = context->CreateStream(socket, std::to_string(++endpoints));
-    Testing::Completion handshake;
-    stream->AsyncHandshake("localhost", "", handshake.ForEnd());
-    Require(handshake);
-    Testing::Completion written;
-    stream->AsyncWrite(request.data(), request.size(), written.ForTransfer());
-    Require(written);
-    char buffer[16384];
-    Testing::Completion read;
-    stream->AsyncReadSome(buffer, sizeof buffer, read.ForTransfer());
-    Require(read);
-    stream->Close();
-  };
+  const auto exchange = [&] { Exchange(*context, service.GetPort()); };
   createContext();
-  for (int i = 0; i < 20; ++i) { // until each I/O thread has what OpenSSL keeps for a thread
+  for (int i = 0; i < 20; ++i) { // until each I/O thread has its thread-local data of OpenSSL
     ASSERT_EQ(OutcomeOf(exchange), "done");
   }
   ASSERT_TRUE(Testing::DrainIoThreads());

@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
-// Neither a password nor a response must be left behind in the heap. This program replaces the allocation functions of C++, and looks into
-// each piece of memory as it is given back.
+// Neither a password nor a response may remain in the heap. This program replaces the allocation functions of C++, and
+// searches each piece of memory when it is freed.
 #include "compose/ws_security.h"
 #include "exchange/request_builder_impl.h"
 #include "exchange/soap_response.h"
@@ -34,10 +34,10 @@
 
 namespace {
 
-std::atomic<const char *> g_secret{nullptr}; // not owned; null while nobody looks
+std::atomic<const char *> g_secret{nullptr}; // not owned; null when there is no search
 std::atomic<int> g_found{0};
 
-std::atomic<const void *> g_sentBody{nullptr}; // not owned; only compared, as it may be gone
+std::atomic<const void *> g_sentBody{nullptr}; // not owned; only compared, because it may be freed
 std::atomic<bool> g_isSentBodyFreed{false};
 
 void LookForSecret(const void *memory) noexcept {
@@ -52,7 +52,7 @@ void LookForSecret(const void *memory) noexcept {
 }
 
 void *Allocate(std::size_t bytes) {
-  // What the last owner left is overwritten, so that only what the code under test wrote is found.
+  // Overwrites the previous content, so that only what the code under test wrote is found.
   void *const memory = std::calloc(1, bytes ? bytes : 1);
   if (!memory) {
     throw std::bad_alloc();
@@ -92,7 +92,7 @@ void operator delete[](void *memory, std::size_t) noexcept {
 namespace SsoClient {
 namespace {
 
-/// Counts how many pieces of memory were given back with the secret in them while it lived.
+/// Counts how many pieces of memory with the secret in them were freed while it existed.
 class Watch {
 public:
   explicit Watch(const char *secret) {
@@ -112,13 +112,13 @@ const char SHORT_PASSWORD[] = "tr0ub4dor";
 TokenSpec Spec() {
   TokenSpec spec;
   spec.tokenLifetimeSec = 600;
-  for (int i = 0; i < 100; ++i) { // a request that outgrows many a buffer
+  for (int i = 0; i < 100; ++i) { // a request that outgrows many buffers
     spec.audienceRestriction.insert("https://audience.example/" + std::to_string(i));
   }
   return spec;
 }
 
-/// Answers each request without keeping a copy, which would hold the password.
+/// Answers each request without keeping a copy, which would contain the password.
 class ForgetfulTransport final : public Transport {
 public:
   std::shared_ptr<TransportSession> CreateSession() const override { return std::make_shared<Session>(); }
@@ -137,13 +137,13 @@ private:
 
 class FreedMemory : public testing::TestWithParam<const char *> {};
 
-TEST_P(FreedMemory, IsFoundToHoldASecretThatNobodyWiped) {
+TEST_P(FreedMemory, IsFoundToContainASecretThatWasNotWiped) {
   const Watch watch(GetParam());
   delete new std::string(std::string(GetParam()) + std::string(100, 'x'));
   EXPECT_GT(watch.Found(), 0);
 }
 
-TEST_P(FreedMemory, HoldsNoPasswordOfARequestThatIsGone) {
+TEST_P(FreedMemory, ContainsNoPasswordOfADestroyedRequest) {
   const RequestBuilderImpl plain(boost::none);
   const RequestBuilderImpl identified(Testing::HolderIdentity());
   const std::string password = GetParam();
@@ -160,8 +160,8 @@ TEST_P(FreedMemory, HoldsNoPasswordOfARequestThatIsGone) {
   EXPECT_EQ(watch.Found(), 0);
 }
 
-// The whole of it fits into a buffer that later parts of a longer request would overwrite.
-TEST_P(FreedMemory, HoldsNoPasswordOfAShortRequestThatIsGone) {
+// The whole request fits into a buffer that the later parts of a longer one would overwrite.
+TEST_P(FreedMemory, ContainsNoPasswordOfADestroyedShortRequest) {
   const RequestBuilderImpl builder(boost::none);
   const std::string password = GetParam();
   TokenSpec spec;
@@ -175,7 +175,7 @@ TEST_P(FreedMemory, HoldsNoPasswordOfAShortRequestThatIsGone) {
   EXPECT_EQ(watch.Found(), 0);
 }
 
-TEST_P(FreedMemory, HoldsNoPasswordOfARequestThatCannotBeBuilt) {
+TEST_P(FreedMemory, ContainsNoPasswordOfARequestThatCannotBeBuilt) {
   const RequestBuilderImpl builder(boost::none);
   const std::string password = GetParam();
   const std::string uncarriable = password + "\x01";
@@ -189,7 +189,7 @@ TEST_P(FreedMemory, HoldsNoPasswordOfARequestThatCannotBeBuilt) {
   EXPECT_EQ(watch.Found(), 0);
 }
 
-TEST_P(FreedMemory, HoldsTheWipedRequestBeforeTheResponseIsRead) {
+TEST_P(FreedMemory, ContainsTheWipedRequestBeforeTheResponseIsRead) {
   const std::string password = GetParam();
   const TokenSpec spec = Spec();
   bool wasFreed = false;
@@ -204,7 +204,7 @@ TEST_P(FreedMemory, HoldsTheWipedRequestBeforeTheResponseIsRead) {
   EXPECT_EQ(watch.Found(), 0);
 }
 
-TEST_P(FreedMemory, HoldsNoTextThatWasKeptAsASecret) {
+TEST_P(FreedMemory, ContainsNoTextThatWasKeptAsASecret) {
   const std::string password = GetParam();
   const Watch watch(GetParam());
   auto text = std::make_unique<Tarvel::SecretText>(password);
@@ -215,7 +215,7 @@ TEST_P(FreedMemory, HoldsNoTextThatWasKeptAsASecret) {
   EXPECT_EQ(watch.Found(), 0);
 }
 
-TEST_P(FreedMemory, HoldsNoPasswordOfAnAsynchronousOperationThatIsOver) {
+TEST_P(FreedMemory, ContainsNoPasswordOfACompletedAsynchronousOperation) {
   const std::string password = GetParam();
   const TokenSpec spec = Spec();
   const auto over = std::make_shared<Testing::EventCount>();
@@ -231,11 +231,12 @@ TEST_P(FreedMemory, HoldsNoPasswordOfAnAsynchronousOperationThatIsOver) {
   service->AcquireTokenAsync("alice", password, spec,
                              [](const std::shared_ptr<const SamlToken> &, const Tarvel::Exception *) {});
   service.reset();
-  ASSERT_TRUE(over->WaitFor(1)); // the work releases the service after the password
+  ASSERT_TRUE(over->WaitFor(1)); // the operation releases the service after the password
   EXPECT_EQ(watch.Found(), 0);
 }
 
-/// Posts the secret, alone and in much else, to a service that never reads it: this process must hold no copy but ours.
+/// Posts the secret, alone and after much padding, to a service that never reads it: this process must have no copy
+/// except the test's.
 int CountFindsOfPosts(const char *secret, const Testing::ScriptedServer::Script &script,
                       std::optional<Testing::TlsSettings> tls, std::int64_t timeout) {
   Testing::ServiceStandIn service(script, tls, timeout);
@@ -250,9 +251,9 @@ int CountFindsOfPosts(const char *secret, const Testing::ScriptedServer::Script 
   return watch.Found();
 }
 
-TEST_P(FreedMemory, HoldsNoPasswordOfARequestThatWasSent) {
+TEST_P(FreedMemory, ContainsNoPasswordOfARequestThatWasSent) {
   const auto answer = [](Testing::ServerConnection &connection) {
-    connection.ShakeHands();
+    connection.Handshake();
     connection.Write(Testing::Response("200 OK", "<answer/>"));
     connection.WaitForInterrupt();
   };
@@ -260,10 +261,10 @@ TEST_P(FreedMemory, HoldsNoPasswordOfARequestThatWasSent) {
   EXPECT_EQ(CountFindsOfPosts(GetParam(), answer, Testing::TlsSettings(), Testing::NO_TIMEOUT), 0);
 }
 
-TEST_P(FreedMemory, HoldsNoPasswordOfARequestThatFailed) {
+TEST_P(FreedMemory, ContainsNoPasswordOfARequestThatFailed) {
   constexpr std::int64_t SHORT = 200000; // microseconds
   const auto stall = [](Testing::ServerConnection &connection) {
-    connection.ShakeHands();
+    connection.Handshake();
     connection.WaitForInterrupt();
   };
   const auto reset = [](Testing::ServerConnection &connection) { connection.Reset(); };
@@ -275,11 +276,12 @@ TEST_P(FreedMemory, HoldsNoPasswordOfARequestThatFailed) {
 
 enum class Reading { NOT, IN_PIECES, WHOLE, AS_XML };
 
-/// Has a service answer with these pieces, which outlive it, and counts the copies that this process leaves in freed memory.
+/// Lets a service answer with these pieces, which outlive it, and counts the copies that this process leaves in freed
+/// memory.
 int CountFindsOfAnswers(const char *secret, const std::vector<std::string> &pieces,
                         const std::optional<Testing::TlsSettings> &tls, Reading reading) {
   const auto script = [&pieces](Testing::ServerConnection &connection) {
-    connection.ShakeHands();
+    connection.Handshake();
     connection.ReadRequest();
     for (const std::string &piece : pieces) {
       connection.Write(piece);
@@ -303,13 +305,13 @@ int CountFindsOfAnswers(const char *secret, const std::vector<std::string> &piec
     if (reading == Reading::AS_XML) {
       EXPECT_THROW(CheckSoapFault(*ParseResponseDocument(*response)), SsoException);
     }
-  } catch (const CommunicationException &) { // for the bad ones; NOLINT(bugprone-empty-catch)
+  } catch (const CommunicationException &) { // for wrong responses; NOLINT(bugprone-empty-catch)
   }
   EXPECT_TRUE(Testing::DrainIoThreads());
   return watch.Found();
 }
 
-/// The secret in a SOAP message that is longer than any text keeps in itself, between a lot else or not.
+/// The secret in a SOAP message that is too long for a string's inline buffer, between much padding or none.
 std::string AnswerWithSecret(const char *secret, std::size_t padding) {
   return "<e:Envelope xmlns:e=\"http://schemas.xmlsoap.org/soap/envelope/\"><!--" + std::string(padding, 'x') +
          "--><e:Body><e:Fault><faultcode>e:Server</faultcode><detail>" + secret + "</detail></e:Fault></e:Body><!--" +
@@ -332,7 +334,7 @@ std::string InChunks(const std::string &body, std::size_t length) {
   return chunks.str() + "0\r\n\r\n";
 }
 
-TEST_P(FreedMemory, HoldsNothingOfAResponse) {
+TEST_P(FreedMemory, ContainsNothingOfAResponse) {
   const std::string ok = "HTTP/1.1 200 OK\r\n";
   for (const std::size_t padding : {std::size_t(0), std::size_t(200000)}) {
     const std::string body = AnswerWithSecret(GetParam(), padding);
@@ -351,7 +353,7 @@ TEST_P(FreedMemory, HoldsNothingOfAResponse) {
   }
 }
 
-TEST_P(FreedMemory, HoldsNothingOfAResponseThatIsRefused) {
+TEST_P(FreedMemory, ContainsNothingOfARefusedResponse) {
   const std::string body = AnswerWithSecret(GetParam(), 0);
   for (const std::string &bytes :
        {"HTTP/1.1 503 Down\r\n\r\n" + body, "HTTP/1.1 200 OK\r\nContent-Length: 100000\r\n\r\n" + body,
@@ -368,7 +370,7 @@ TEST_P(FreedMemory, HoldsNothingOfAResponseThatIsRefused) {
 
 enum class LastRead { ENDS, THROWS };
 
-/// Gives the text away in pieces, as a file does.
+/// Returns the text in pieces, as a file does.
 class PieceReader final : public Tarvel::Reader {
 public:
   PieceReader(const std::string &text, LastRead last) : m_text(text), m_last(last) {}
@@ -387,7 +389,7 @@ private:
   std::size_t m_position = 0;
 };
 
-TEST_P(FreedMemory, HoldsNothingOfATextThatWasReadOrParsed) {
+TEST_P(FreedMemory, ContainsNothingOfATextThatWasReadOrParsed) {
   for (const std::size_t padding : {std::size_t(0), std::size_t(200000)}) {
     const std::string text = AnswerWithSecret(GetParam(), padding);
     const Watch watch(GetParam());
@@ -405,7 +407,7 @@ TEST_P(FreedMemory, HoldsNothingOfATextThatWasReadOrParsed) {
   }
 }
 
-TEST_P(FreedMemory, HoldsNothingOfATextThatCouldNotBeReadToItsEnd) {
+TEST_P(FreedMemory, ContainsNothingOfATextThatCouldNotBeReadToItsEnd) {
   for (const std::size_t padding : {std::size_t(0), std::size_t(200000)}) {
     const std::string text = AnswerWithSecret(GetParam(), padding);
     const Watch watch(GetParam());
@@ -414,8 +416,8 @@ TEST_P(FreedMemory, HoldsNothingOfATextThatCouldNotBeReadToItsEnd) {
   }
 }
 
-// The tree of a document that is accepted keeps its texts, and is not overwritten.
-TEST_P(FreedMemory, HoldsNothingOfADocumentThatIsRefusedAfterReferencesWereReplaced) {
+// The tree of an accepted document keeps its texts, and is not overwritten.
+TEST_P(FreedMemory, ContainsNothingOfADocumentThatIsRefusedAfterReferencesWereReplaced) {
   const std::string secret = GetParam();
   for (const std::string &text : {"<a x='&amp;" + secret + "' x=''/>", "<a>&amp;" + secret + "&", "<a><!--\r" + secret,
                                   "<a><?t \r" + secret, "<a x='&lt;' y='&lt;" + secret + "' <"}) {
@@ -429,9 +431,9 @@ TEST_P(FreedMemory, HoldsNothingOfADocumentThatIsRefusedAfterReferencesWereRepla
 INSTANTIATE_TEST_SUITE_P(LongAndShort, FreedMemory, testing::Values(LONG_PASSWORD, SHORT_PASSWORD),
                          [](const auto &password) { return password.param == LONG_PASSWORD ? "Long" : "Short"; });
 
-TEST(SecureWipe, OverwritesAndEmptiesATextTogetherWithWhatALongerValueLeftBehind) {
+TEST(SecureWipe, OverwritesAndEmptiesATextWithTheRestOfALongerValue) {
   std::string text = LONG_PASSWORD;
-  text.resize(3); // the rest stays in the memory
+  text.resize(3); // the rest remains in memory
   const char *const memory = text.data();
   const std::size_t bytes = text.capacity();
   Tarvel::SecureWipe(text);
@@ -440,7 +442,7 @@ TEST(SecureWipe, OverwritesAndEmptiesATextTogetherWithWhatALongerValueLeftBehind
   EXPECT_EQ(std::string_view(memory, bytes), std::string(bytes, '\0'));
 }
 
-TEST(SecureWipe, OverwritesAListOfBytesAndTakesEmptyOnes) {
+TEST(SecureWipe, OverwritesAListOfBytesAndAcceptsAnEmptyOne) {
   std::vector<std::uint8_t> bytes = {1, 2, 3};
   const std::uint8_t *const memory = bytes.data();
   Tarvel::SecureWipe(bytes);

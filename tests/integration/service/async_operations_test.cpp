@@ -21,9 +21,9 @@ using TokenPtr = std::shared_ptr<const SamlToken>;
 
 struct AsyncOperation {
   const char *name;
-  ExpectedFields fields; ///< of the token, if it yields one
+  ExpectedFields fields; ///< of the token, if the operation returns one
   const char *success;
-  const char *failure; ///< that of a request with a SOAP fault for an answer
+  const char *failure; ///< the failure when the answer is a SOAP fault
   std::function<void(const SecurityTokenService &, const TokenPtr &, const OperationOutcome &)> start;
 };
 
@@ -77,7 +77,7 @@ std::vector<AsyncOperation> AsyncOperations() {
 
 class EachAsyncOperationOverTls : public testing::TestWithParam<AsyncOperation> {
 protected:
-  /// Starts the operation with a token, on a service at `url`, and lets go of all but the TLS context.
+  /// Starts the operation with a token, on a service at `url`, and releases everything except the TLS context.
   void StartAndRelease(const std::string &url) {
     TokenSpec spec = SpecFor(3600);
     spec.renewable = true;
@@ -93,7 +93,7 @@ protected:
   const OperationOutcome m_outcome{};
 };
 
-TEST_P(EachAsyncOperationOverTls, CallsBackOnceOnAnotherThreadThoughAllIsReleased) {
+TEST_P(EachAsyncOperationOverTls, CallsBackOnceOnAnotherThreadAfterEverythingIsReleased) {
   StartAndRelease(RunningService().GetUrl());
   ASSERT_TRUE(m_outcome.IsOver());
   EXPECT_EQ(m_outcome.Wait(), std::vector<std::string>{GetParam().success});

@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
-// A service that gets no charset, and so takes a request for ISO-8859-1 and answers in it: every operation works all the
-// same with texts beyond ASCII, and beyond ISO-8859-1.
+// A service that gets no charset, and so reads a request as ISO-8859-1 and answers in it: every operation still works
+// with texts beyond ASCII, and beyond ISO-8859-1.
 #include "integration/service/service_client.h"
 #include "support/throws_message.h"
 #include "support/work_folder.h"
@@ -24,7 +24,7 @@ const char USERS[] =
     R"([{"name":"jürgen-ł-語-😀@grün.example","password":"pässword ł 語 😀","first":"Jürgen ł","last":"語 😀",
                           "groups":["größe-ł@grün.example","語-😀@grün.example"]}])";
 
-/// A service in that charset with that one user.
+/// A service in that charset with only that user.
 class ServiceIn {
 public:
   explicit ServiceIn(const std::string &charset)
@@ -100,7 +100,7 @@ TEST_F(ServiceInLatin1, DelegatesToANameBeyondAscii) {
   EXPECT_EQ(Compare(m_client->AcquireTokenByToken(*held, spec), expected, m_begin), "");
 }
 
-TEST_F(ServiceInLatin1, TakesATokenOfAServiceInUtf8AndTheReverse) {
+TEST_F(ServiceInLatin1, AcceptsATokenOfAServiceInUtf8AndViceVersa) {
   const ServiceIn other("UTF-8");
   const ServiceClient otherClient("client", other.GetUrl());
   const TokenPtr fromOther = otherClient->AcquireToken(USER, USER_PASSWORD, Spec());

@@ -1,5 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
-// Each operation against the development service, over TLS: what the token says is compared in full.
+// Each operation against the development service, over TLS: all facts of the token are compared.
 #include "integration/service/service_client.h"
 #include "support/identity.h"
 #include "support/throws_message.h"
@@ -20,7 +20,7 @@ using TokenPtr = std::shared_ptr<const SamlToken>;
 
 const char FULL_ADVICE[] = "https://advice.example/{colour=red,green;size=7} urn:more{no value=}";
 
-/// What `fields` become of a token that `FullSpec` was asked for.
+/// `fields`, changed as for a token that was requested with `FullSpec`.
 ExpectedFields Full(ExpectedFields fields) {
   fields.lifetimeSec = 7200;
   fields.renewable = true;
@@ -30,7 +30,7 @@ ExpectedFields Full(ExpectedFields fields) {
   return fields;
 }
 
-/// The fields of alice's token, confirmed by the key of that identity.
+/// The fields of alice's token, bound to the key of that identity.
 ExpectedFields Held(const std::string &identity) {
   ExpectedFields fields;
   fields.confirmation = identity;
@@ -63,15 +63,15 @@ TEST_F(ServiceOverTls, AcquiresABearerTokenByPassword) {
   EXPECT_EQ(Compare(m_plain->AcquireToken(ALICE, PASSWORD, SpecFor(3600)), {}, m_begin), "");
 }
 
-TEST_F(ServiceOverTls, AcquiresABearerTokenByPasswordWithAllThatASpecCanAskFor) {
+TEST_F(ServiceOverTls, AcquiresABearerTokenByPasswordWithEverythingThatASpecCanRequest) {
   EXPECT_EQ(Compare(m_plain->AcquireToken(ALICE, PASSWORD, FullSpec()), Full({}), m_begin), "");
 }
 
-TEST_F(ServiceOverTls, AcquiresAHolderOfKeyTokenByPasswordWithAllThatASpecCanAskFor) {
+TEST_F(ServiceOverTls, AcquiresAHolderOfKeyTokenByPasswordWithEverythingThatASpecCanRequest) {
   EXPECT_EQ(Compare(m_client->AcquireToken(ALICE, PASSWORD, FullSpec()), Full(Held("client")), m_begin), "");
 }
 
-TEST_F(ServiceOverTls, AcquiresABearerTokenByPasswordThoughThereIsAnIdentity) {
+TEST_F(ServiceOverTls, AcquiresABearerTokenByPasswordEvenWithAnIdentity) {
   EXPECT_EQ(Compare(m_client->AcquireToken(ALICE, PASSWORD, Bearer(SpecFor(3600))), {}, m_begin), "");
 }
 
@@ -108,7 +108,7 @@ TEST_F(ServiceOverTls, ExchangesATokenForABearerToken) {
   EXPECT_EQ(Compare(m_client->AcquireTokenByToken(*held, Bearer(SpecFor(3600))), {}, m_begin), "");
 }
 
-TEST_F(ServiceOverTls, ExchangesATokenWithDelegationAgainAndAgain) {
+TEST_F(ServiceOverTls, ExchangesATokenWithDelegationRepeatedly) {
   const TokenPtr held = m_client->AcquireToken(ALICE, PASSWORD, Delegable(SpecFor(3600)));
   const TokenPtr first = m_client->AcquireTokenByToken(*held, To("bob@corp.example", FullSpec()));
   ExpectedFields expected = Full(Held("client"));
@@ -141,14 +141,14 @@ TEST_F(ServiceOverTls, ValidatesATokenOfEitherKind) {
   EXPECT_TRUE(m_client->ValidateSubject(*m_client->AcquireTokenByCertificate(SpecFor(60))));
 }
 
-/// The token with another first name in it.
+/// The token with a changed first name.
 TokenStandIn Tampered(const SamlToken &token) {
   std::string xml = token.ToXml();
   xml.replace(xml.find(">Alice<"), 7, ">Malice<");
   return TokenStandIn(token.GetId(), xml, token.GetConfirmationMethod());
 }
 
-TEST_F(ServiceOverTls, HearsThatATamperedTokenIsNotValid) {
+TEST_F(ServiceOverTls, ReportsThatATamperedTokenIsNotValid) {
   EXPECT_FALSE(m_plain->ValidateSubject(Tampered(*m_plain->AcquireToken(ALICE, PASSWORD, SpecFor(60)))));
 }
 
@@ -162,8 +162,8 @@ TEST_F(ServiceOverTls, ReportsAWrongPasswordAndAnUnknownUserAlike) {
   EXPECT_NE(m_plain->AcquireToken(ALICE, PASSWORD, SpecFor(60)), nullptr);
 }
 
-TEST_F(ServiceOverTls, ReportsThatAHolderOfKeyTokenWasAskedForWithoutProof) {
-  // With a delegate the request goes unsigned, but asks for what the identity stands for.
+TEST_F(ServiceOverTls, ReportsThatAHolderOfKeyTokenWasRequestedWithoutProof) {
+  // With a delegate the request is not signed, but it still requests a token for the identity's key.
   EXPECT_THROWS_MESSAGE(m_client->AcquireToken(ALICE, PASSWORD, To("bob@corp.example", SpecFor(60))), SsoException,
                         "Unexpected SOAP fault: wst:InvalidRequest; request failed.");
 }
@@ -184,9 +184,9 @@ TEST_F(ServiceOverTls, ReportsACertificateThatTheServiceDoesNotKnow) {
   const auto context = TrustingContext();
   SecurityTokenServiceConfig config = ConfigFor(*context, "", RunningService().GetUrl());
   config.holderOfKeyConfig = HolderIdentity();
-  EXPECT_THROWS_MESSAGE(CreateSecurityTokenService(config)->AcquireTokenByCertificate(SpecFor(60)),
-                        InvalidCredentialsException,
-                        "Authentication failed: the certificate is none that the service's authority gave a client");
+  EXPECT_THROWS_MESSAGE(
+      CreateSecurityTokenService(config)->AcquireTokenByCertificate(SpecFor(60)), InvalidCredentialsException,
+      "Authentication failed: the certificate is not a client certificate of the service's authority");
 }
 
 TEST_F(ServiceOverTls, ReportsARenewalOfATokenThatIsNotRenewable) {
@@ -203,13 +203,13 @@ TEST_F(ServiceOverTls, ReportsTheDelegationOfATokenThatIsNotDelegable) {
 
 TEST_F(ServiceOverTls, ReportsThatATamperedTokenIsNotExchangedOrRenewed) {
   const TokenPtr held = m_client->AcquireToken(ALICE, PASSWORD, FullSpec());
-  const char message[] = "Authentication failed: the token's signature is not this service's";
+  const char message[] = "Authentication failed: the token is not signed by this service";
   EXPECT_THROWS_MESSAGE(m_client->AcquireTokenByToken(Tampered(*held), SpecFor(60)), InvalidCredentialsException,
                         message);
   EXPECT_THROWS_MESSAGE(m_client->RenewToken(Tampered(*held), 60), InvalidCredentialsException, message);
 }
 
-TEST_F(ServiceOverTls, RefusesALifetimeAndAnIdentityThatAreMissingWithoutAskingTheService) {
+TEST_F(ServiceOverTls, RefusesAMissingLifetimeOrIdentityWithoutARequest) {
   const std::string log = RunningService().GetLog();
   EXPECT_THROWS_MESSAGE(m_plain->AcquireToken(ALICE, PASSWORD, SpecFor(0)), Tarvel::InvalidArgumentException,
                         "Invalid argument : Token lifetime must be positive");
@@ -218,7 +218,7 @@ TEST_F(ServiceOverTls, RefusesALifetimeAndAnIdentityThatAreMissingWithoutAskingT
   EXPECT_EQ(RunningService().GetLog(), log);
 }
 
-TEST_F(ServiceOverTls, AcceptsNoTokenThatIsSignedByAnotherThanTheTrusted) {
+TEST_F(ServiceOverTls, RefusesATokenThatIsSignedWithAnUntrustedKey) {
   const auto context = TrustingContext();
   SecurityTokenServiceConfig config = ConfigFor(*context, "", RunningService().GetUrl());
   config.signingCertificates = {

@@ -56,7 +56,7 @@ std::string ConfirmationOf(const SamlToken &token) {
   return certificate ? "holder-of-key of somebody else" : "holder-of-key without certificate";
 }
 
-/// When the last delegation happened, or the token began if there was none.
+/// The time of the last delegation, or the token's start if there was none.
 std::int64_t LastInstantOf(const SamlToken &token) {
   std::vector<SsoClient::Delegate> chain;
   token.GetDelegationChain(chain);

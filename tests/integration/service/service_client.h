@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// `ServiceClient`, the library's service on the development service, and what tokens from there say.
+/// `ServiceClient`, which uses the development service through the library, and the expected facts of its tokens.
 
 #pragma once
 
@@ -18,7 +18,7 @@ namespace Testing {
 constexpr const char *ALICE = "alice@corp.example";
 constexpr const char *PASSWORD = "wonderland";
 
-/// The service of this program, started when first asked for.
+/// The service of this program, started at the first call.
 DevSts &RunningService();
 
 /// The certificates that tokens of the running service must be signed with.
@@ -30,12 +30,12 @@ SsoClient::HolderOfKeyConfig IdentityOf(const std::string &name);
 /// A context that trusts the running service's authority.
 Tarvel::Ref<Tarvel::Ssl::SSLContext> TrustingContext();
 
-/// What describes the running service. `context` must outlive whatever is made of it.
-/// @param identity as for `IdentityOf`; empty for none
+/// The configuration for the running service. `context` must exist until a service or context is created from it.
+/// @param identity a name as in `IdentityOf`; empty for none
 SsoClient::SecurityTokenServiceConfig ConfigFor(Tarvel::Ssl::SSLContext &context, const std::string &identity,
                                                 const std::string &url);
 
-/// The library's service, with the TLS context that it needs.
+/// The library's service object, with the TLS context that it needs.
 class ServiceClient {
 public:
   /// Bearer tokens only, without an identity.
@@ -50,17 +50,17 @@ private:
   const std::shared_ptr<const SsoClient::SecurityTokenService> m_service;
 };
 
-/// A spec for that many seconds.
+/// A spec with a lifetime of that many seconds.
 SsoClient::TokenSpec SpecFor(std::int64_t lifetimeSec);
 
-/// Everything that a spec can ask for, but a delegate.
+/// Everything that a spec can request, except a delegate.
 SsoClient::TokenSpec FullSpec();
 
-/// What `DescribeFields` says of a token; the defaults are those of alice's plain bearer token.
+/// The fields of a token that `DescribeFields` shows; the defaults are those of alice's plain bearer token.
 struct ExpectedFields {
   std::string subject = ALICE;
   std::int64_t lifetimeSec = 3600;
-  std::string confirmation = "bearer"; ///< or the name of the identity whose certificate it is
+  std::string confirmation = "bearer"; ///< or the name of the identity to whose key the token is bound
   bool renewable = false;
   bool delegable = false;
   bool solution = false;
@@ -68,25 +68,25 @@ struct ExpectedFields {
   std::vector<std::string> groups = {"admins@corp.example", "users@corp.example"};
   std::vector<std::string> delegation = {}; ///< the delegates, without the instants
   std::vector<std::string> audience = {};
-  std::string advice = {}; ///< as "source{name=value,value;name=value}"
+  std::string advice = {}; ///< in the form "source{name=value,value;name=value}"
 };
 
-/// What a token for the client certificate says that has nobody's name or groups in it.
+/// The fields of a token for the client certificate, which has no person's name and no groups.
 ExpectedFields FieldsOfCertificate(const std::string &identity);
 
-/// All of `expected`, one line each.
+/// All of `expected`, one field on each line.
 std::string Describe(const ExpectedFields &expected);
 
-/// The same of a token: all it says, but for its identifier, its start and its XML.
+/// The same for a token: all its facts except its identifier, its start and its XML.
 std::string DescribeFields(const SsoClient::SamlToken &token);
 
-/// How `DescribeFields` and a few properties of the rest fail to be as expected; empty when all is well. The rest is: the
-/// identifier is there; the token begins, and its last delegation happened, since `earliest` (microseconds since 1970)
-/// and not in the future; its XML stands on its own.
+/// The differences between a token and `expected`; empty when there are none. Compares `DescribeFields`, and also
+/// checks that the token has an identifier, that its start and its last delegation are not before `earliest`
+/// (microseconds since 1970) and not in the future, and that its XML is complete by itself.
 std::string Compare(const std::shared_ptr<const SsoClient::SamlToken> &token, const ExpectedFields &expected,
                     std::int64_t earliest);
 
-/// The time in milliseconds' steps, as tokens tell it, in microseconds since 1970.
+/// The time in microseconds since 1970, rounded down to milliseconds as in tokens.
 std::int64_t NowInMilliseconds();
 
 } // namespace Testing

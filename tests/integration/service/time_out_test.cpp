@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
-// A service that stalls: a leg of a negotiation is given up after 40 seconds, another request is not. Nothing in the
-// library makes these times shorter, so that this test takes as long.
+// A service that stalls: a leg of a negotiation times out after 40 seconds, another request does not. The library has
+// no setting that shortens these times, so this test takes that long.
 #include "integration/service/service_client.h"
 #include "support/rendezvous.h"
 #include "support/throws_message.h"
@@ -31,7 +31,7 @@ bool IsRefusedByTheService(const std::function<void()> &ask) {
   return false;
 }
 
-TEST(AServiceThatStalls, EndsALegAfterFortySecondsAndNoOtherRequestSoSoon) {
+TEST(StallingService, MakesALegTimeOutAfterFortySecondsButNoOtherRequest) {
   const std::int64_t begin = NowInMilliseconds();
   std::string outcome;
   EventCount called;
@@ -50,7 +50,7 @@ TEST(AServiceThatStalls, EndsALegAfterFortySecondsAndNoOtherRequestSoSoon) {
                         "No response from localhost:" + std::to_string(RunningService().GetPort()) +
                             " within 40 seconds");
   EXPECT_GE(std::chrono::steady_clock::now() - start, std::chrono::seconds(40));
-  // The same context goes on: the service answers now, though it refuses what is no negotiation token.
+  // The same context still works: the service answers now, although it refuses bytes that are not a negotiation token.
   EXPECT_TRUE(IsRefusedByTheService([&] { negotiation->NegotiateToken({1, 2, 3}); }));
 
   // Answered after 42 seconds.

@@ -15,7 +15,7 @@ namespace {
 
 constexpr std::string_view DIGITS = "0123456789";
 
-/// The class's name; of one that is not expected anywhere, what the compiler calls it.
+/// The name of the class; for a class that no test expects, the compiler's name.
 std::string ClassOf(const std::exception &exception) {
   const struct {
     const std::type_info &type;
@@ -39,7 +39,7 @@ void ReplaceAll(std::string &message, std::string_view from, std::string_view to
   }
 }
 
-/// Puts "#" in place of each number that comes between `before` and `after`.
+/// Replaces each number between `before` and `after` by "#".
 void HideNumbers(std::string &message, std::string_view before, std::string_view after) {
   for (std::size_t at = message.find(before); at != std::string::npos; at = message.find(before, at)) {
     at += before.size();
@@ -50,7 +50,7 @@ void HideNumbers(std::string &message, std::string_view before, std::string_view
   }
 }
 
-/// Puts "DATE" in place of each date and time.
+/// Replaces each date and time by "DATE".
 void HideDates(std::string &message) {
   constexpr std::string_view FORM = "0000-00-00T00:00:00.000Z";
   const auto fits = [](char form, char c) { return form == '0' ? DIGITS.find(c) != DIGITS.npos : c == form; };
@@ -61,7 +61,7 @@ void HideDates(std::string &message) {
   }
 }
 
-/// The message as `WrongAnswer` has it.
+/// The message in the form of `WrongAnswer`.
 std::string Reduce(std::string message, int port) {
   ReplaceAll(message, "localhost:" + std::to_string(port), "%e");
   HideNumbers(message, "line ", ", column");

@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// The wrong answers of the development service, each with the exception that an operation raises for it.
+/// The wrong answers of the development service, each with the exception that an operation throws for it.
 
 #pragma once
 
@@ -11,12 +11,12 @@ namespace Testing {
 
 struct WrongAnswer {
   const char *fault;
-  /// "CLASS: MESSAGE" of the exception. %e stands for the endpoint, and what differs from one answer to the next is
-  /// reduced: lines, columns and lengths to "#", dates to "DATE".
+  /// "CLASS: MESSAGE" of the exception. %e is the endpoint. Parts that differ between answers are replaced: lines,
+  /// columns and lengths by "#", dates by "DATE".
   const char *outcome;
 };
 
-/// Whatever was asked for.
+/// Wrong answers to every operation.
 inline const WrongAnswer TO_ALL[] = {
     {"reset", "CommunicationException: The TLS connection to localhost broke: The connection to %e broke: Connection "
               "reset by peer"},
@@ -66,7 +66,7 @@ inline const WrongAnswer TO_ALL[] = {
     {"soap-fault-Unknown", "SsoException: Unexpected SOAP fault: devsts:Unknown; request failed."},
 };
 
-/// Where a token was asked for.
+/// Wrong answers to operations that request a token.
 inline const WrongAnswer INSTEAD_OF_A_TOKEN[] = {
     {"expired-token", "SsoException: The token has expired at: DATE"},
     {"early-token", "SsoException: Token start date is in the future: DATE"},
@@ -79,7 +79,7 @@ inline const WrongAnswer INSTEAD_OF_A_TOKEN[] = {
     {"wrong-version", "SsoException: Invalid token version"},
 };
 
-/// How `operation` ends, on the service that listens at `port`: with what it returns, or with "CLASS: MESSAGE" as in
+/// The outcome of `operation` on the service that listens at `port`: its result, or "CLASS: MESSAGE" as in
 /// `WrongAnswer`.
 std::string OutcomeOf(const std::function<std::string()> &operation, int port);
 

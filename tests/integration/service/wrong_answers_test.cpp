@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
-// Every wrong answer of the development service, to each operation: the class and the whole message of the exception, and
-// that the same service object works afterwards.
+// Every wrong answer of the development service to each operation: checks the class and the whole message of the
+// exception, and that the same service object works afterwards.
 #include "integration/service/service_client.h"
 #include "integration/service/wrong_answers.h"
 
@@ -59,7 +59,8 @@ const Operation OPERATIONS[] = {
      }},
 };
 
-/// Outcome of the operation that `run` runs on a service at `url`, and then of the same on the same service.
+/// The outcome of an operation that gets the wrong answer, and then that of the same operation on the same service
+/// object.
 std::string OutcomesOf(const Operation &operation, const std::string &fault, const SamlToken &held) {
   const ServiceClient client("client", RunningService().FaultUrl(fault) + "/once/" + operation.name);
   const std::string outcome = OutcomeOf([&] { return operation.run(*client, held); }, RunningService().GetPort());
@@ -75,7 +76,7 @@ protected:
   const TokenPtr m_held = ServiceClient("client")->AcquireToken(ALICE, PASSWORD, RenewableSpec());
 };
 
-TEST_P(EachOperationAnsweredWrongly, ReportsItAndWorksAfterwards) {
+TEST_P(EachOperationAnsweredWrongly, ReportsTheAnswerAndWorksAfterwards) {
   const bool yieldsToken = GetParam().name != std::string("ValidateSubject");
   for (const WrongAnswer &answer : TO_ALL) {
     Expect(answer, yieldsToken ? "token" : "valid");
@@ -87,7 +88,7 @@ INSTANTIATE_TEST_SUITE_P(SecurityTokenService, EachOperationAnsweredWrongly, tes
 
 class EachTokenOperationAnsweredWrongly : public EachOperationAnsweredWrongly {};
 
-TEST_P(EachTokenOperationAnsweredWrongly, HandsOutNoWrongTokenAndWorksAfterwards) {
+TEST_P(EachTokenOperationAnsweredWrongly, RefusesAWrongTokenAndWorksAfterwards) {
   for (const WrongAnswer &answer : INSTEAD_OF_A_TOKEN) {
     Expect(answer, "token");
   }
@@ -97,13 +98,13 @@ INSTANTIATE_TEST_SUITE_P(SecurityTokenService, EachTokenOperationAnsweredWrongly
                          testing::ValuesIn(std::begin(OPERATIONS), std::end(OPERATIONS) - 1),
                          [](const auto &operation) { return std::string(operation.param.name); });
 
-TEST(ValidateSubjectAnsweredWrongly, TakesNoUnknownStatusForAVerdict) {
+TEST(ValidateSubjectAnsweredWrongly, RefusesAnUnknownStatus) {
   const TokenPtr held = ServiceClient()->AcquireToken(ALICE, PASSWORD, SpecFor(3600));
   EXPECT_EQ(OutcomesOf(std::end(OPERATIONS)[-1], "wrong-status", *held),
             "SsoException: Unexpected XML format; then valid");
 }
 
-/// The message of the exception that acquiring a token raises.
+/// The message of the exception that acquiring a token throws.
 std::string MessageOf(const char *fault) {
   try {
     ServiceClient("", RunningService().FaultUrl(fault))->AcquireToken(ALICE, PASSWORD, SpecFor(3600));
@@ -113,7 +114,7 @@ std::string MessageOf(const char *fault) {
   return "nothing was thrown";
 }
 
-TEST(AcquireTokenOverTls, NamesTheDateOfATokenThatIsNotCurrent) {
+TEST(AcquireTokenOverTls, ReportsTheDateOfATokenThatIsNotValidNow) {
   constexpr std::int64_t DAY = 86400000000; // microseconds
   struct {
     const char *fault;
@@ -131,12 +132,12 @@ TEST(AcquireTokenOverTls, NamesTheDateOfATokenThatIsNotCurrent) {
   }
 }
 
-TEST(AcquireTokenOverTls, TakesAResponseThatDrips) {
+TEST(AcquireTokenOverTls, AcceptsAResponseThatArrivesSlowly) {
   const ServiceClient client("", RunningService().FaultUrl("drip-1"));
   EXPECT_EQ(DescribeFields(*client->AcquireToken(ALICE, PASSWORD, SpecFor(3600))), Describe({}));
 }
 
-TEST(AcquireTokenOverTls, LeavesItToTheCallerToJudgeAudienceAndConfirmation) {
+TEST(AcquireTokenOverTls, LeavesAudienceAndConfirmationToTheCaller) {
   ExpectedFields elsewhere;
   elsewhere.audience = {"https://elsewhere.example/"};
   const ServiceClient wrongAudience("", RunningService().FaultUrl("wrong-audience"));

@@ -41,7 +41,7 @@ SsoClient::SecurityTokenServiceConfig CannedService::GetConfig() const {
 }
 
 void CannedService::Serve(ServerConnection &peer) const {
-  if (!peer.ShakeHands()) {
+  if (!peer.Handshake()) {
     return;
   }
   const std::string request = peer.ReadRequest();

@@ -1,6 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// `CannedService`, a token service on loopback, over TLS, that judges nothing and gives the answer of each kind at once.
+/// `CannedService`, a token service on loopback, over TLS, that checks nothing and answers each kind of request at
+/// once.
 
 #pragma once
 
@@ -17,13 +18,13 @@
 
 namespace Testing {
 
-/// For what is tested with more requests, or more at a time, than a service that judges them would bear.
+/// For tests with more requests, in total or at once, than a service that checks them could answer.
 class CannedService {
 public:
-  /// @param beforeAnswer runs for each request, on a thread of its own, before it is answered
+  /// @param beforeAnswer runs for each request, on a separate thread, before it is answered
   explicit CannedService(std::function<void()> beforeAnswer = [] {});
 
-  /// What describes the service, with a holder-of-key identity. The TLS context is the service's.
+  /// The configuration for this service, with a holder-of-key identity. This object owns the TLS context.
   SsoClient::SecurityTokenServiceConfig GetConfig() const;
 
   /// How many connections the service has accepted.

@@ -1,5 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
-// What a completion may do while completions hold every thread of the pool.
+// What a completion may do when completions occupy every thread of the pool.
 #include "integration/service_load/canned_service.h"
 #include "support/rendezvous.h"
 

@@ -27,7 +27,7 @@ using TokenPtr = std::shared_ptr<const SamlToken>;
 
 constexpr int OPERATIONS = 1000;
 
-/// What each of the operations was told, by its number.
+/// The results of the operations, by their numbers.
 class Outcomes {
 public:
   SecurityTokenService::TokenCompletion ForToken(int number) const {
@@ -44,7 +44,7 @@ public:
   bool WaitForAll() const { return m_state->called.WaitFor(OPERATIONS); }
   int CountCalls() const { return m_state->called.Get(); }
 
-  /// All that operation `number` was told.
+  /// All results of operation `number`.
   std::string Get(int number) const {
     const std::lock_guard<std::mutex> lock(m_state->mutex);
     return m_state->results[static_cast<std::size_t>(number)];
@@ -99,7 +99,7 @@ void Start(const SecurityTokenService &service, const TokenPtr &held, int number
   }
 }
 
-TEST(AsyncOperationsOverTls, CompleteAThousandOnceEachThoughAllIsReleasedAndTheServiceStalls) {
+TEST(AThousandAsyncOperationsOverTls, CompleteOnceEachWhenTheServiceStallsAndEverythingIsReleased) {
   const Testing::RecordedLog log;
   const Testing::ScopedLogLevel level(63);
   const auto gate = std::make_shared<Testing::Gate>();
@@ -114,7 +114,7 @@ TEST(AsyncOperationsOverTls, CompleteAThousandOnceEachThoughAllIsReleasedAndTheS
     for (int i = 0; i < OPERATIONS; ++i) {
       Start(*service, held, i, outcomes);
     }
-  } // service, token and configuration are gone
+  } // service, token and configuration are destroyed
 
   // The pool has no more threads than this; the others wait in its queue.
   ASSERT_TRUE(gate->WaitForArrivals(Tarvel::System::DEFAULT_THREAD_CEILING));
@@ -131,7 +131,7 @@ TEST(AsyncOperationsOverTls, CompleteAThousandOnceEachThoughAllIsReleasedAndTheS
   EXPECT_EQ(outcomes.CountCalls(), OPERATIONS);
   EXPECT_EQ(server.CountConnections(), OPERATIONS);
   EXPECT_TRUE(Testing::Eventually([&] { return server.CountOpenConnections() == 0; }));
-  // What a completion throws ends its work item and nothing else.
+  // An exception from a completion ends only its work item.
   ASSERT_TRUE(log.WaitForLines(OPERATIONS / 10));
   EXPECT_EQ(log.Lines(),
             std::vector<std::string>(OPERATIONS / 10, "Tarvel 8 An exception left a work item of the thread pool: "

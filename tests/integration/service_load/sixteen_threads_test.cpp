@@ -21,13 +21,13 @@ namespace {
 using Testing::CountAllocatedBytes;
 using Testing::CountDescriptors;
 
-/// TLS sessions, of which the latest are kept, are not all of one size; client and service both live in this process. A
-/// leak of seven bytes in each of 20,000 operations would be more.
+/// The heap may grow a little, because the cached TLS sessions differ in size, and client and service are both in this
+/// process. A leak of seven bytes in each of 20,000 operations would be more.
 constexpr std::size_t MOST_BYTES_OF_GROWTH = 131072;
 
 TEST(OneServiceOnSixteenThreadsOverTls, RunsTwentyThousandOperationsWithoutErrorOrGrowth) {
   const int count = Testing::Repetitions(20000, 2000);
-  constexpr int FIRST = 800; // after which whatever is made once is there
+  constexpr int FIRST = 800; // afterwards everything that is made only once exists
   const Testing::CannedService server;
   const auto allEnded = [&] { return server.CountOpenConnections() == 0; };
   const auto service = CreateSecurityTokenService(server.GetConfig());
@@ -50,10 +50,10 @@ TEST(OneServiceOnSixteenThreadsOverTls, RunsTwentyThousandOperationsWithoutError
       << CountAllocatedBytes() << " bytes, after " << bytes;
 }
 
-// What the growth is measured with must see each library's memory, and see it go.
-TEST(AllocatedBytes, AreThoseThatAreHeldWhoeverAllocatesThem) {
+// The measurement of growth must include each library's memory, and notice when it is freed.
+TEST(AllocatedBytes, CountTheAllocationsOfEveryLibraryUntilTheyAreFreed) {
   if (Testing::IS_SANITIZED) {
-    GTEST_SKIP() << "a sanitizer has an allocator of its own";
+    GTEST_SKIP() << "a sanitizer has its own allocator";
   }
   const std::size_t before = CountAllocatedBytes();
   auto ours = std::make_unique<std::string>(100'000, 'x');

@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
-// A token inside our messages keeps its own signature: as it stands there, whatever its way of writing, as long as the way
-// it was canonicalised lets any message hold it.
+// The signature of a token inside our messages stays valid, however the token is written, if its canonicalisation does
+// not include the elements around it.
 #include "exchange/request_builder_impl.h"
 #include "integration/signed_requests/foreign_document.h"
 #include "support/data_file.h"
@@ -53,7 +53,7 @@ protected:
     return IsValidSignature(Child(Assertion(document), "Signature"), ReadDataFile(certificate));
   }
 
-  /// The same, when the assertion is first taken out into a document of its own.
+  /// The same, after the assertion was copied into its own document.
   static bool IsValidTakenOutOf(const std::string &message, const std::string &certificate) {
     const ForeignDocument document(message);
     const xmlDocPtr alone = xmlNewDoc(reinterpret_cast<const xmlChar *>("1.0"));
@@ -68,7 +68,7 @@ protected:
     return IsValidSignature(Child(standalone.Root(), "Signature"), ReadDataFile(certificate));
   }
 
-  /// That the message itself is signed well around the token; a validate request is not signed.
+  /// Whether the message's own signature is valid; a validate request has none.
   static bool IsMessageValid(const std::string &message) {
     const ForeignDocument document(message);
     for (const xmlNodePtr signature : FindAll(document.Root(), "Signature")) {
@@ -87,7 +87,7 @@ struct Fixture {
   const char *certificate;
 };
 
-/// Tokens whose signature says nothing about what is around them.
+/// Tokens whose signature does not depend on the elements around them.
 const Fixture EXCLUSIVE_TOKENS[] = {
     {"bearer", "sts-rsa"},
     {"bearer-minimal", "sts-rsa"},
@@ -105,7 +105,7 @@ const Fixture EXCLUSIVE_TOKENS[] = {
     {"ecdsa-p521-sha512", "sts-ec521"},
 };
 
-TEST_F(EmbeddedToken, KeepsItsSignatureInEveryMessageWhateverItsWayOfWriting) {
+TEST_F(EmbeddedToken, KeepsItsSignatureInEveryMessageHoweverItIsWritten) {
   for (const Fixture &fixture : EXCLUSIVE_TOKENS) {
     const std::string certificate = std::string("tokens/") + fixture.certificate + ".crt";
     for (const Embedding &embedding : EMBEDDINGS) {
@@ -116,10 +116,10 @@ TEST_F(EmbeddedToken, KeepsItsSignatureInEveryMessageWhateverItsWayOfWriting) {
   }
 }
 
-/// Inclusive canonicalisation puts the declarations of all elements around into what was signed, so that no message which
-/// declares anything can hold such a token validly; and a reference to "" means the message, once the token is in one.
-/// The service must take these tokens out to verify them, and then they are what they were.
-TEST_F(EmbeddedToken, OfInclusiveCanonicalisationIsGoodAgainOnceTakenOut) {
+/// Inclusive canonicalisation includes the declarations of all elements around the token, so its signature is not valid
+/// in a message that declares anything; and in a message, a reference to "" means the message. The service must copy
+/// these tokens into their own documents to verify them; there they are valid again.
+TEST_F(EmbeddedToken, OfInclusiveCanonicalisationIsValidAgainInItsOwnDocument) {
   for (const char *const name : {"c14n-inclusive", "c14n-inclusive-with-comments", "c14n-mixed",
                                  "style-prefixes-on-root-inclusive", "reference-empty-uri"}) {
     for (const Embedding &embedding : EMBEDDINGS) {
@@ -131,8 +131,8 @@ TEST_F(EmbeddedToken, OfInclusiveCanonicalisationIsGoodAgainOnceTakenOut) {
   }
 }
 
-/// A token written with the prefix `p` for SAML (empty: the default namespace) and `d` for signatures, with further
-/// declarations on its root, its signature canonicalised by `algorithm`. Not signed yet.
+/// An unsigned token with the prefix `p` for SAML (empty: the default namespace) and `d` for signatures, with further
+/// declarations on its root, and with a signature template for the canonicalisation `algorithm`.
 std::string TokenTemplate(const std::string &p, const std::string &d, const std::string &declarations,
                           const std::string &algorithm) {
   const std::string s = p.empty() ? "" : p + ":";
@@ -178,7 +178,7 @@ std::string Declare(const std::string &prefix, const std::string &uri) {
 const std::string SAML = "urn:oasis:names:tc:SAML:2.0:assertion";
 
 TEST_F(EmbeddedToken, KeepsItsSignatureWhateverPrefixesItShares) {
-  // Prefixes that our messages use for other namespaces, and the default namespace that they leave alone.
+  // Prefixes that our messages use for other namespaces, and the default namespace, which they do not use.
   for (const std::string prefix : {"", "saml", "soapenv", "wsse", "wsu", "wst", "ds", "rsa-advice"}) {
     for (const std::string signaturePrefix : {"ds", "wst", "soapenv", "sig"}) {
       if (prefix == signaturePrefix) {
@@ -206,7 +206,7 @@ TEST_F(EmbeddedToken, OfInclusiveCanonicalisationKeepsItsSignatureWhenItsRootDec
   }
 }
 
-/// A token in a response whose elements above declare the prefixes that it uses, as our own parser takes it from there.
+/// A token from a response whose outer elements declare the token's prefixes, extracted by our own parser.
 class TokenFromResponse : public EmbeddedToken {
 protected:
   static std::shared_ptr<const SamlToken> Take(const std::string &prefix, const std::string &aboveDeclarations,
@@ -236,7 +236,7 @@ TEST_F(TokenFromResponse, KeepsItsSignatureWhenItsPrefixesAreDeclaredAboveIt) {
   }
 }
 
-TEST_F(TokenFromResponse, OfInclusiveCanonicalisationIsGoodOnceTakenOut) {
+TEST_F(TokenFromResponse, OfInclusiveCanonicalisationIsValidInItsOwnDocument) {
   const auto token = Take("saml", Declare("saml", SAML) + Declare("soapenv", "urn:s"), INCLUSIVE);
   Request request;
   m_builder.BuildExchangeTokenRequest(*token, FullSpec(), request);

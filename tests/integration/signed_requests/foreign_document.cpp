@@ -39,7 +39,7 @@ void StartEngineOnce() {
     if (xmlSecInit() < 0 || xmlSecCryptoAppInit(nullptr) < 0 || xmlSecCryptoInit() < 0) {
       throw std::runtime_error("xmlsec1 does not start");
     }
-    xmlSecErrorsSetCallback(SayNothing); // changed messages are refused by the hundred
+    xmlSecErrorsSetCallback(SayNothing); // otherwise it would print a report for each of hundreds of refused messages
   });
 }
 

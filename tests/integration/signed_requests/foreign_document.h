@@ -45,11 +45,12 @@ std::vector<xmlNodePtr> Elements(xmlNodePtr root);
 std::string TextOf(xmlNodePtr node);
 std::string AttributeOf(xmlNodePtr element, const std::string &localName);
 
-/// What xmlsec1 says about the signature element with the key of that certificate (PEM or DER): whether it is valid. A
-/// signature that cannot be judged, as when a reference does not resolve, is not valid.
+/// Whether the signature element is valid for xmlsec1 with the key of that certificate (PEM or DER). A signature that
+/// cannot be checked, for example because a reference does not resolve, is not valid.
 bool IsValidSignature(xmlNodePtr signature, const std::string &certificate);
 
-/// Fills in and signs the empty signature template in `xml` with the private key (PEM), and returns the signed document.
+/// Fills in and signs the empty signature template in `xml` with the private key (PEM), and returns the signed
+/// document.
 /// @throws std::runtime_error when xmlsec1 cannot sign.
 std::string SignTemplate(const std::string &xml, const std::string &privateKeyPem);
 

@@ -1,12 +1,14 @@
 // SPDX-License-Identifier: Apache-2.0
-// Each request against the schemas of its standards: those that Debian packages, and those in tests/data/schemas.
+// Validates each request against the schemas of its standards: those that Debian packages, and those in
+// tests/data/schemas.
 //
-// Every element of every request validates. What the schemas leave open because the wire form is fixed otherwise:
-// - wst:UseKey/@Sig is a plain identifier, where WS-Trust 1.3 wants a URI reference to the signature ("#..."). As an
-//   xs:anyURI it is valid all the same.
+// Every element of every request is valid. These differences from the standards remain, which the schemas do not
+// detect:
+// - wst:UseKey/@Sig is a plain identifier, although WS-Trust 1.3 requires a URI reference to the signature ("#...").
+//   As an xs:anyURI it is still valid.
 // - wst:BinaryExchange/@ValueType is the SPNEGO URI of the WS-Trust of February 2005: WS-Trust 1.3 leaves it open.
 // - wsse11:TokenType has "tokenprofile" where the SAML Token Profile 1.1 has "token-profile": the attribute is open.
-// - an audience or an advice source that is not a URI goes out as it is, though xs:anyURI is what the schemas say of it.
+// - an audience or an advice source that is not a URI is sent as it is, although its type in the schemas is xs:anyURI.
 //   The samples have URIs.
 #include "exchange/request_builder_impl.h"
 #include "integration/signed_requests/foreign_document.h"
@@ -39,13 +41,13 @@ void Gather(void *texts, const char *format, ...) {
   *static_cast<std::string *>(texts) += line;
 }
 
-/// The schemas that no network is asked for.
+/// The schemas, loaded without the network.
 class Schemas {
 public:
   Schemas() {
     xmlSetExternalEntityLoader(xmlNoNetExternalEntityLoader);
     const std::string path = DataPath("schemas/request.xsd");
-    std::string warnings; // an import that was imported already, more than once
+    std::string warnings; // there is one for each import that was imported already
     const std::unique_ptr<xmlSchemaParserCtxt, decltype(&xmlSchemaFreeParserCtxt)> parser(
         xmlSchemaNewParserCtxt(path.c_str()), &xmlSchemaFreeParserCtxt);
     xmlSchemaSetParserErrors(parser.get(), Gather, Gather, &warnings);
@@ -55,7 +57,7 @@ public:
     }
   }
 
-  /// What is wrong with the document; empty when it is valid.
+  /// The errors in the document; empty when it is valid.
   std::string Judge(const std::string &xml) const {
     const ForeignDocument document(xml);
     std::string errors;
@@ -95,7 +97,7 @@ TEST_P(ValidRequest, ValidatesWithTheRealClockAndIdentifiers) {
 INSTANTIATE_TEST_SUITE_P(EveryRequest, ValidRequest, testing::ValuesIn(SampleRequests()),
                          [](const auto &sample) { return TestName(sample.param); });
 
-TEST_F(ValidRequest, HoldsEveryKindOfIssuedToken) {
+TEST_F(ValidRequest, MayContainEveryKindOfIssuedToken) {
   const RequestBuilderImpl builder{HolderIdentity()};
   for (const char *const name :
        {"bearer", "holder-of-key", "full", "delegated", "bearer-5k", "style-default-namespace"}) {
@@ -111,8 +113,8 @@ TEST_F(ValidRequest, HoldsEveryKindOfIssuedToken) {
   }
 }
 
-/// That the schemas would notice: each replacement in the fullest request must make it invalid.
-TEST_F(ValidRequest, IsNoLongerOneAfterASmallMistake) {
+/// Shows that the schemas detect mistakes: each replacement in the request with the most elements must make it invalid.
+TEST_F(ValidRequest, IsInvalidAfterASmallMistake) {
   const std::pair<const char *, const char *> mistakes[] = {
       {"wsu:Created", "wsu:Make"},
       {"wsse:Username>", "wsse:UserName>"},

@@ -1,5 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
-// What we sign, xmlsec1 verifies; what anybody changes afterwards, it refuses.
+// xmlsec1 verifies the requests that we sign, and refuses them after any change.
 #include "exchange/request_builder_impl.h"
 #include "integration/signed_requests/foreign_document.h"
 #include "support/data_file.h"
@@ -16,7 +16,7 @@ namespace {
 
 using namespace Testing;
 
-/// All samples that are signed, and the operations that present a token once more with a real, signed one.
+/// All samples that are signed, and the operations that present a token again, with a genuine signed one.
 std::vector<SampleRequest> SignedRequests() {
   std::vector<SampleRequest> samples;
   for (const SampleRequest &sample : SampleRequests()) {
@@ -42,7 +42,8 @@ protected:
     return Child(Find(document.Root(), "Security"), "Signature");
   }
 
-  /// The certificate that the signature's key info leads to: the one in the message, or the holder's own for an assertion.
+  /// The certificate to which the signature's key info refers: the one in the message, or the holder's for an
+  /// assertion.
   static std::string NamedCertificate(const ForeignDocument &document) {
     const xmlNodePtr keyInfo = Child(MessageSignature(document), "KeyInfo");
     const auto references = FindAll(keyInfo, "Reference");
@@ -60,7 +61,7 @@ protected:
   Request m_request;
 };
 
-TEST_P(SignedEnvelope, VerifiesWithTheKeyThatItsKeyInfoNames) {
+TEST_P(SignedEnvelope, VerifiesWithTheKeyToWhichItsKeyInfoRefers) {
   const ForeignDocument document(m_request.body);
   EXPECT_TRUE(IsValidSignature(MessageSignature(document), NamedCertificate(document))) << m_request.body;
 }

@@ -1,5 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
-// Whatever a caller writes into a text field, another engine reads back.
+// A foreign engine reads from a text field exactly what the caller wrote into it.
 #include "exchange/request_builder_impl.h"
 #include "integration/signed_requests/foreign_document.h"
 #include "support/identity.h"
@@ -87,7 +87,7 @@ TEST_P(TextField, IsWrittenInAscii) {
 TEST_P(TextField, IsCoveredByTheSignatureAsItWasWritten) {
   for (const std::string &text : TEXTS) {
     TokenSpec spec = SpecWith(text);
-    spec.delegateTo = boost::none; // a delegated request by password goes unsigned
+    spec.delegateTo = boost::none; // a delegated request by password is not signed
     Request request;
     m_builder.BuildUserPassTokenRequest(text, text, spec, request);
     const ForeignDocument document(request.body);
@@ -100,7 +100,7 @@ TEST_P(TextField, IsCoveredByTheSignatureAsItWasWritten) {
   }
 }
 
-TEST_P(TextField, OfACharacterThatXmlCannotCarryIsRefusedBeforeThereIsARequest) {
+TEST_P(TextField, WithACharacterThatXmlCannotRepresentIsRefusedBeforeARequestExists) {
   for (const std::string &text : {std::string("a\0b", 3), std::string("\x01"), std::string("\x1b[0m"),
                                   std::string("\xef\xbf\xbf"), std::string("\xed\xa0\x80"), std::string("\xff")}) {
     TokenSpec plain;

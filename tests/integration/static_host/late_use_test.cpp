@@ -34,7 +34,7 @@ TEST(StaticObjectThatJoinsAWorker, WaitsForNoResponseOverTls) {
   const std::shared_future<void> requested = promise.get_future().share();
   const ScriptedServer stalling(
       [&promise](ServerConnection &peer) {
-        if (peer.ShakeHands() && !peer.ReadRequest().empty()) {
+        if (peer.Handshake() && !peer.ReadRequest().empty()) {
           promise.set_value();
         }
         peer.Stall();

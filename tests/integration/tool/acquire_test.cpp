@@ -1,9 +1,11 @@
 // SPDX-License-Identifier: Apache-2.0
-// What acquire prints, whole, and what the service's every answer makes of it.
+// What acquire prints, asserted whole, for every kind of answer of the service.
 
 #include "expect_result.h"
 #include "service_test.h"
 #include "token_values.h"
+
+#include "support/data_file.h"
 
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
@@ -21,131 +23,12 @@ namespace {
 using testing::HasSubstr;
 using testing::MatchesRegex;
 using testing::Not;
+using Testing::ReadDataFile;
 using testing::StartsWith;
 
 class Acquire : public ServiceTest {};
 
-constexpr const char *ALICE_TEXT = R"(Verified:        yes
-Id:              @ID@
-Subject:         alice@corp.example
-First name:      Alice
-Last name:       Liddell
-Confirmation:    bearer
-Not before:      @NOT_BEFORE@
-Not on or after: @NOT_ON_OR_AFTER@
-Renewable:       no
-Delegable:       no
-Solution:        no
-Group:           corp.example\admins
-Group:           corp.example\users
-)";
-
-constexpr const char *EVERYTHING_JSON = R"({
-  "schema": 1,
-  "verified": true,
-  "id": "@ID@",
-  "subject": {
-    "name": "alice",
-    "domain": "corp.example"
-  },
-  "confirmation": "bearer",
-  "notBefore": "@NOT_BEFORE@",
-  "notOnOrAfter": "@NOT_ON_OR_AFTER@",
-  "renewable": true,
-  "delegable": true,
-  "solution": false,
-  "fullName": {
-    "first": "Alice",
-    "last": "Liddell"
-  },
-  "groups": [
-    {
-      "name": "admins",
-      "domain": "corp.example"
-    },
-    {
-      "name": "users",
-      "domain": "corp.example"
-    }
-  ],
-  "delegation": [
-    {
-      "name": "bob",
-      "domain": "corp.example",
-      "instant": "@DELEGATION_INSTANT@"
-    }
-  ],
-  "audience": [
-    "https://files.corp.example/",
-    "https://mail.corp.example/"
-  ],
-  "advice": [
-    {
-      "source": "urn:corp.example:mapper",
-      "attributes": [
-        {
-          "name": "color",
-          "values": [
-            "green",
-            "a=b:c"
-          ]
-        },
-        {
-          "name": "urn:corp.example:size",
-          "values": [
-            "10"
-          ]
-        }
-      ]
-    },
-    {
-      "source": "audit",
-      "attributes": [
-        {
-          "name": "by",
-          "values": [
-            "\u00e9\\"
-          ]
-        }
-      ]
-    }
-  ],
-  "certificate": null,
-  "unmet": []
-}
-)";
-
-constexpr const char *CLIENT_JSON = R"({
-  "schema": 1,
-  "verified": true,
-  "id": "@ID@",
-  "subject": {
-    "name": "client",
-    "domain": "corp.example"
-  },
-  "confirmation": "holder-of-key",
-  "notBefore": "@NOT_BEFORE@",
-  "notOnOrAfter": "@NOT_ON_OR_AFTER@",
-  "renewable": false,
-  "delegable": false,
-  "solution": true,
-  "fullName": {
-    "first": "",
-    "last": ""
-  },
-  "groups": [],
-  "delegation": [],
-  "audience": [],
-  "advice": [],
-  "certificate": {
-    "subject": "CN=client,O=corp.example",
-    "sha256": "@SHA256@"
-  },
-  "unmet": []
-}
-)";
-
-/// The seconds since the epoch of a text as the tool writes it, without its fraction.
+/// The seconds since the epoch of a date in the tool's output, without the fraction.
 std::time_t SecondsOf(const std::string &text) {
   std::tm fields = {};
   std::istringstream(text) >> std::get_time(&fields, "%Y-%m-%dT%H:%M:%S");
@@ -154,7 +37,7 @@ std::time_t SecondsOf(const std::string &text) {
 
 TEST_F(Acquire, ByPasswordShowsTheTokenAsText) {
   const Result result = Run("ssoclient acquire " + Service() + PASSWORD + "--out token.xml");
-  ExpectResult(result, 0, FillFrom(m_folder.Read("token.xml"), ALICE_TEXT), "");
+  ExpectResult(result, 0, FillFrom(m_folder.Read("token.xml"), ReadDataFile("tool/acquired_by_password.txt")), "");
 }
 
 TEST_F(Acquire, AsksForEveryPropertyAndShowsTheTokenAsJson) {
@@ -165,8 +48,8 @@ TEST_F(Acquire, AsksForEveryPropertyAndShowsTheTokenAsJson) {
           "--advice audit:by='\xC3\xA9\\\\' --advice 'urn:corp.example:mapper:urn\\:corp.example\\:size=10' "
           "--advice urn:corp.example:mapper:color=a=b:c --format json --out token.xml");
   const std::string xml = m_folder.Read("token.xml");
-  const std::string expected =
-      Fill(FillFrom(xml, EVERYTHING_JSON), "@DELEGATION_INSTANT@", AttributeIn(xml, "DelegationInstant"));
+  const std::string expected = Fill(FillFrom(xml, ReadDataFile("tool/acquired_with_everything.json")),
+                                    "@DELEGATION_INSTANT@", AttributeIn(xml, "DelegationInstant"));
   ExpectResult(result, 0, expected, "");
   const std::string conditions = xml.substr(xml.find("Conditions "));
   EXPECT_EQ(90 * 60,
@@ -185,7 +68,10 @@ TEST_F(Acquire, ByIdentityAloneBindsTheTokenToTheKey) {
   const Result result = Run("ssoclient acquire " + Service() + IDENTITY + "--format json --out token.xml");
   const Result thumbprint = Run("openssl x509 -in client.pem -noout -fingerprint -sha256 | sed 's/.*=//;s/://g' | "
                                 "tr -d '\\n' | tr A-F a-f");
-  ExpectResult(result, 0, Fill(FillFrom(m_folder.Read("token.xml"), CLIENT_JSON), "@SHA256@", thumbprint.out), "");
+  ExpectResult(result, 0,
+               Fill(FillFrom(m_folder.Read("token.xml"), ReadDataFile("tool/acquired_by_identity.json")), "@SHA256@",
+                    thumbprint.out),
+               "");
 }
 
 TEST_F(Acquire, ByPasswordBindsTheTokenToTheIdentityUnlessABearerTokenIsAskedFor) {
@@ -209,7 +95,7 @@ TEST_F(Acquire, InExchangeDelegatesTheToken) {
                                     AttributeIn(m_folder.Read("second.xml"), "DelegationInstant") + "\n"));
 }
 
-TEST_F(Acquire, TakesAnIdentityFromAKeyStoreAndAnEncryptedKey) {
+TEST_F(Acquire, ReadsAnIdentityFromAKeyStoreAndAnEncryptedKey) {
   Run("openssl pkcs12 -export -in client.pem -inkey client.key -passout pass:'open sesame' -out client.p12");
   Run("openssl pkcs8 -topk8 -in client.key -passout pass:'open sesame' -out encrypted.key");
   m_folder.Write("passphrase.txt", "open sesame\n");
@@ -230,7 +116,7 @@ TEST_F(Acquire, ReadsPasswordAndPassphraseFromOneScript) {
   EXPECT_THAT(result.out, HasSubstr("\nConfirmation:    holder-of-key\n"));
 }
 
-TEST_F(Acquire, GivesTheTokenItselfOnStandardOutput) {
+TEST_F(Acquire, WritesTheTokenItselfToStandardOutput) {
   for (const char *options : {"--format xml", "--out -", "--out - --format xml"}) {
     const Result result = Run("ssoclient acquire " + Service() + PASSWORD + options + " >token.xml");
     ExpectResult(result, 0, "", "");
@@ -238,12 +124,12 @@ TEST_F(Acquire, GivesTheTokenItselfOnStandardOutput) {
   }
 }
 
-TEST_F(Acquire, WritesTheTokenToTheFileAloneWhenTheFormatIsXml) {
+TEST_F(Acquire, WritesTheTokenOnlyToTheFileWhenTheFormatIsXml) {
   ExpectResult(Run("ssoclient acquire " + Service() + PASSWORD + "--format xml --out token.xml"), 0, "", "");
   EXPECT_EQ(0, Run("ssoclient verify --trust sts.pem token.xml").exitCode);
 }
 
-TEST_F(Acquire, TakesTheServersThumbprintInPlaceOfAnAuthority) {
+TEST_F(Acquire, AcceptsTheServersThumbprintInsteadOfAnAuthority) {
   std::string withColons = m_service.GetThumbprint();
   for (std::size_t at = 2; at < withColons.size(); at += 3) {
     withColons.insert(at, ":");
@@ -256,7 +142,7 @@ TEST_F(Acquire, TakesTheServersThumbprintInPlaceOfAnAuthority) {
   EXPECT_THAT(wrong.err, StartsWith("ssoclient: communication failed: "));
 }
 
-TEST_F(Acquire, TrustsNoServerThatTheAuthoritiesDoNotVouchFor) {
+TEST_F(Acquire, RefusesAServerWhoseCertificateTheAuthoritiesDidNotIssue) {
   for (const char *authority : {"", "--ca client.pem "}) {
     const Result result =
         Run("ssoclient acquire --sts " + m_service.GetUrl() + " --trust sts.pem " + authority + PASSWORD);
@@ -267,7 +153,7 @@ TEST_F(Acquire, TrustsNoServerThatTheAuthoritiesDoNotVouchFor) {
   }
 }
 
-TEST_F(Acquire, HoldsAnIssuedTokenToANarrowerTolerance) {
+TEST_F(Acquire, ChecksAnIssuedTokenWithANarrowerTolerance) {
   const std::string line = "ssoclient acquire " + Service() + PASSWORD + "--lifetime 1h --out token.xml ";
   const Result result = Run(line + "--tolerance -3600");
   EXPECT_EQ(5, result.exitCode);
@@ -279,7 +165,7 @@ TEST_F(Acquire, HoldsAnIssuedTokenToANarrowerTolerance) {
 
 constexpr const char *OPERATION = "[0-9a-f]{8}(-[0-9a-f]{4}){3}-[0-9a-f]{12}";
 
-TEST_F(Acquire, ShowsTheLibrarysLogAndNoSecretInIt) {
+TEST_F(Acquire, ShowsTheLibrarysLogWithoutSecrets) {
   const Result result = Run("ssoclient acquire -v " + Service() + PASSWORD + "--format xml");
   EXPECT_EQ(0, result.exitCode);
   std::istringstream lines(result.err);
@@ -301,7 +187,7 @@ TEST_F(Acquire, ShowsTheLibrarysLogAndNoSecretInIt) {
   EXPECT_THAT(result.err, Not(HasSubstr("saml:")));
 }
 
-TEST_F(Acquire, ShowsThePasswordInNoFailure) {
+TEST_F(Acquire, ShowsNoPasswordInAFailure) {
   m_folder.Write("wrong.txt", "l00king-glass\n");
   for (const char *fault : {"", "reset", "bad-status", "garbled-xml", "soap-fault-Unknown"}) {
     const Result result = Run("ssoclient acquire -v --format json " + Service(fault) +
@@ -319,7 +205,7 @@ struct Answer {
   int exitCode;
   const char *exceptionClass;
   const char *label;
-  const char *message; ///< holds nothing that JSON escapes
+  const char *message; ///< contains nothing that JSON escapes
 };
 
 const Answer ANSWERS[] = {
@@ -329,7 +215,7 @@ const Answer ANSWERS[] = {
      "credentials refused", "Authentication failed: unknown user or wrong password"},
     {"UnknownIdentity", "", "--cert foreign.pem --key foreign.key ", 3, "InvalidCredentialsException",
      "credentials refused",
-     "Authentication failed: the certificate is none that the service's authority gave a client"},
+     "Authentication failed: the certificate is not a client certificate of the service's authority"},
     {"FailedAuthentication", "soap-fault-FailedAuthentication", PASSWORD, 3, "InvalidCredentialsException",
      "credentials refused", "Authentication failed: a fault was asked for"},
     {"BrokenConnection", "reset", PASSWORD, 4, "CommunicationException", "communication failed",
@@ -406,7 +292,7 @@ TEST_F(Acquire, RefusesATokenThatIsNotSigned) {
   EXPECT_EQ(0u, m_folder.Names().count("token.xml"));
 }
 
-TEST_F(Acquire, RefusesATokenThatTheServiceIssuesOutOfDate) {
+TEST_F(Acquire, RefusesAnIssuedTokenThatIsOutOfDate) {
   for (const char *fault : {"expired-token", "early-token"}) {
     const Result result = Run("ssoclient acquire --format json " + Service(fault) + PASSWORD + "--out token.xml");
     EXPECT_EQ(8, result.exitCode);

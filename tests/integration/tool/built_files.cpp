@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
-// The only source that is compiled with PROJECT_FOLDER, SSOCLIENT_TOOL and INTERRUPTING_FSYNC: no other one depends on
-// where the project and its build are.
+// The only source that is compiled with the paths of the project and of built files, so that no other source depends on
+// them.
 
 #include "built_files.h"
 
@@ -16,6 +16,14 @@ std::string ToolPath() {
 
 std::string InterruptingFsyncPath() {
   return INTERRUPTING_FSYNC;
+}
+
+std::string SearchingMemoryPath() {
+  return SEARCHING_MEMORY;
+}
+
+std::string ExampleAcquirePath() {
+  return EXAMPLE_ACQUIRE;
 }
 
 } // namespace ToolTest

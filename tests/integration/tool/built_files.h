@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// Where the project and what is built of it are.
+/// The locations of the project and of its built files.
 
 #pragma once
 
@@ -14,7 +14,13 @@ std::string ProjectPath(const std::string &name);
 /// The path of the tool, whose file name is "ssoclient".
 std::string ToolPath();
 
-/// The path of the library that, preloaded, sends its process a signal at fsync.
+/// The path of a library for preloading, which sends its process a signal at fsync.
 std::string InterruptingFsyncPath();
+
+/// The path of a library for preloading, which searches the memory of its process at the end.
+std::string SearchingMemoryPath();
+
+/// The path of the example that acquires a token by password.
+std::string ExampleAcquirePath();
 
 } // namespace ToolTest

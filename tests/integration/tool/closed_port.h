@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// A port of this machine on which nobody listens.
+/// A port of this machine on which no program listens.
 
 #pragma once
 

@@ -21,7 +21,7 @@ std::string ReadText(const std::string &path) {
   return {std::istreambuf_iterator<char>(file), {}};
 }
 
-/// Puts lines that end in a backslash together with the ones behind them.
+/// Joins each line that ends in a backslash with the next line.
 std::vector<std::string> JoinContinued(const std::vector<std::string> &lines) {
   std::vector<std::string> joined;
   bool isContinued = false;
@@ -36,7 +36,7 @@ std::vector<std::string> JoinContinued(const std::vector<std::string> &lines) {
   return joined;
 }
 
-/// The lines of `text` from behind the line `begin` to before the next line `end`, over and over.
+/// The lines of `text` between each line `begin` and the next line `end`.
 std::vector<std::string> LinesBetween(const std::string &text, const std::string &begin, const std::string &end) {
   std::vector<std::string> lines;
   std::istringstream stream(text);

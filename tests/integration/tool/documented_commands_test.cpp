@@ -1,6 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
-// Each command line that the help, the manual and the README show does what a reader expects: it runs. Those that need a
-// Kerberos realm run in another test, which has one.
+// Runs each command line in the help, the manual and the README. Another test runs those that need a Kerberos realm.
 
 #include "documented_commands.h"
 
@@ -12,7 +11,7 @@
 namespace ToolTest {
 namespace {
 
-class Documented : public DocumentedCommands {
+class DocumentedExamples : public DocumentedCommands {
 protected:
   void RunUnlessForTickets(const std::string &example) const {
     if (!IsForTickets(example)) {
@@ -21,7 +20,7 @@ protected:
   }
 };
 
-TEST_F(Documented, OfTheHelpRun) {
+TEST_F(DocumentedExamples, OfTheHelpRun) {
   Acquire("token.xml", PASSWORD);
   for (const char *command : {"acquire", "renew", "validate", "verify", "inspect"}) {
     const std::vector<std::string> examples = ExamplesOfHelp(command);
@@ -33,7 +32,7 @@ TEST_F(Documented, OfTheHelpRun) {
   }
 }
 
-TEST_F(Documented, OfTheManualRun) {
+TEST_F(DocumentedExamples, OfTheManualRun) {
   Acquire("token.xml", PASSWORD);
   const std::vector<std::string> examples = ExamplesOfManual();
   EXPECT_FALSE(examples.empty());
@@ -43,7 +42,7 @@ TEST_F(Documented, OfTheManualRun) {
   }
 }
 
-TEST_F(Documented, OfTheReadmeRun) {
+TEST_F(DocumentedExamples, OfTheReadmeRun) {
   const std::vector<std::string> examples = ExamplesOfPage("README.md");
   EXPECT_FALSE(examples.empty());
   for (const std::string &example : examples) {

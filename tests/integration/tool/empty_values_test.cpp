@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
-// An option with an empty argument, as a shell makes of a variable that is not set, is never taken for an option that is not
-// given.
+// An option with an empty argument, which a shell makes of a variable that is not set, does not count as an option that
+// is not given.
 
 #include "expect_result.h"
 #include "help_options.h"
@@ -38,7 +38,7 @@ TEST_P(EmptyValue, OfEachOptionIsAWrongCommandLine) {
 INSTANTIATE_TEST_SUITE_P(Of, EmptyValue, testing::ValuesIn(COMMANDS),
                          [](const auto &command) { return std::string(command.param); });
 
-TEST(EmptyValue, IsTriedForTheOptionsThatTakeAnArgument) {
+TEST(EmptyValue, IsTestedForTheOptionsThatTakeAnArgument) {
   const std::set<std::string> options = OptionsWithArgument("acquire");
   EXPECT_THAT(options, IsSupersetOf({"--sts",           "--ca",       "--thumbprint",    "--trust",
                                      "--tolerance",     "--user",     "--password-file", "--password-fd",
@@ -52,14 +52,14 @@ TEST(EmptyValue, IsTriedForTheOptionsThatTakeAnArgument) {
   }
 }
 
-TEST(EmptyValue, BehindValuesThatAreNotIsAWrongCommandLine) {
+TEST(EmptyValue, AfterOtherValuesIsAWrongCommandLine) {
   for (const std::string option : {"--trust", "--audience", "--advice"}) {
     ExpectResult(RunTool({"acquire", option, "a:b=c", option, "", option, "a:b=c"}), 2, "",
                  "ssoclient: usage: " + option + ": must not be empty; see ssoclient --help\n");
   }
 }
 
-TEST(EmptyValue, IsNotSeenInTheNameOfAFile) {
+TEST(EmptyValue, IsNotFoundInTheNameOfAFile) {
   ExpectResult(RunTool({"inspect", "--", "--out="}), 7, "", "ssoclient: file: --out=: No such file or directory\n");
 }
 

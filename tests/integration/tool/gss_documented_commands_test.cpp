@@ -1,5 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
-// Each command line of the help, the manual and the pages that needs a Kerberos realm runs in one.
+// Runs, in a Kerberos realm, each command line in the help, the manual and the pages that needs one.
 
 #include "documented_commands.h"
 #include "ticket_world.h"
@@ -28,7 +28,7 @@ protected:
 
   ~DocumentedForTickets() override { unsetenv("KERBEROS_FOLDER"); }
 
-  /// @return how many there are
+  /// @return the number of these examples
   int RunThose(const std::vector<std::string> &examples) const {
     int count = 0;
     for (const std::string &example : examples) {

@@ -1,5 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
-// Acquiring by a Kerberos ticket, in a realm of the test's own.
+// Acquiring by a Kerberos ticket, in a realm that the test starts.
 
 #include "expect_result.h"
 #include "service_test.h"
@@ -34,8 +34,8 @@ protected:
     EXPECT_THAT(result.out, HasSubstr("\nSubject:         " + subject + "\n"));
   }
 
-  /// A failure in one line that begins with ours and goes on with the Kerberos library's words, whose versions differ in
-  /// what they add to them; and no token.
+  /// Expects a failure in one line, and no token. The line begins with our text, and goes on with the Kerberos
+  /// library's, which differs from version to version.
   void ExpectFailure(int exitCode, const std::string &ours, const std::string &words, const Result &result) const {
     EXPECT_EQ(exitCode, result.exitCode);
     EXPECT_EQ("", result.out);
@@ -63,14 +63,14 @@ TEST_F(AcquireByTicket, BindsTheTokenToAKeyWhenThereIsOne) {
   EXPECT_THAT(result.out, HasSubstr("\nConfirmation:    holder-of-key\n"));
 }
 
-TEST_F(AcquireByTicket, GivesABearerTokenWhenThatIsAskedForBesideAKey) {
+TEST_F(AcquireByTicket, GivesABearerTokenWhenOneIsAskedForDespiteAKey) {
   LogIn();
   const Result result = AcquireWith(std::string(IDENTITY) + "--bearer");
   ExpectTokenOf("alice@corp.example", result);
   EXPECT_THAT(result.out, HasSubstr("\nConfirmation:    bearer\n"));
 }
 
-TEST_F(AcquireByTicket, AsksForTheKindOfTokenThatIsWanted) {
+TEST_F(AcquireByTicket, AsksForTheKindOfTokenThatTheOptionsChoose) {
   LogIn();
   const Result result = AcquireWith("--delegable --audience https://files.corp.example/");
   ExpectTokenOf("alice@corp.example", result);
@@ -83,40 +83,40 @@ TEST_F(AcquireByTicket, IsSentWithAWarningAndRefusedWithAHintForADelegatedTokenT
   const std::string options = std::string(IDENTITY) + "--delegate-to bob@corp.example ";
   ExpectResult(
       AcquireWith(options), 8, "",
-      "ssoclient: warning: with --delegate-to, a token is asked for that is bound to the identity's key, but "
-      "without proof of the key, which services refuse\n"
+      "ssoclient: warning: with --delegate-to, the request asks for a token that is bound to the identity's key, "
+      "but does not prove the key; services refuse that\n"
       "ssoclient: service fault: Unexpected SOAP fault: wst:InvalidRequest; request failed.\n"
-      "ssoclient: hint: give --bearer, too: with --user or --gss, a token for --delegate-to cannot be bound to "
+      "ssoclient: hint: also give --bearer: with --user or --gss, a token for --delegate-to cannot be bound to "
       "a key\n");
   ExpectTokenOf("alice@corp.example", AcquireWith(options + "--bearer"));
 }
 
-TEST_F(AcquireByTicket, TakesTheServiceByItsHostOrAsAPrincipal) {
+TEST_F(AcquireByTicket, AcceptsTheServiceByItsHostOrAsAPrincipal) {
   LogIn();
   for (const char *service : {"HTTP@localhost", "HTTP/localhost", "HTTP/localhost@CORP.EXAMPLE"}) {
     ExpectTokenOf("alice@corp.example", AcquireWith(std::string("--force --service ") + service));
   }
 }
 
-TEST_F(AcquireByTicket, TakesTheTicketFromTheNamedCache) {
+TEST_F(AcquireByTicket, UsesTheTicketInTheGivenCache) {
   LogIn();
   const std::string cache = m_realm.NameFile("bob_cache");
   m_realm.GetTicket("bob", m_realm.AddPrincipal("bob"), cache);
   ExpectTokenOf("bob@corp.example", AcquireWith("--ccache " + cache));
 }
 
-TEST_F(AcquireByTicket, TakesTheTicketFromTheCacheThatTheEnvironmentNames) {
+TEST_F(AcquireByTicket, UsesTheTicketInTheCacheOfTheEnvironment) {
   const std::string cache = m_realm.NameFile("bob_cache");
   m_realm.GetTicket("bob", m_realm.AddPrincipal("bob"), cache);
   ExpectTokenOf("bob@corp.example", Run("KRB5CCNAME=" + cache + " ssoclient acquire " + Service() + "--gss"));
 }
 
-TEST_F(AcquireByTicket, GetsATicketWithAKeytabAndKeepsNone) {
+TEST_F(AcquireByTicket, GetsATicketWithAKeytabAndDoesNotKeepIt) {
   ExpectTokenOf("alice@corp.example", AcquireWith("--client-keytab " + PathOf(m_aliceKeytab)));
   EXPECT_FALSE(std::filesystem::exists(PathOf(m_realm.GetDefaultCache())));
 }
 
-TEST_F(AcquireByTicket, KeepsTheKeytabsTicketInTheNamedCache) {
+TEST_F(AcquireByTicket, KeepsTheKeytabsTicketInTheGivenCache) {
   const std::string cache = "--ccache " + m_realm.NameFile("kept_cache");
   ExpectTokenOf("alice@corp.example", AcquireWith(cache + " --client-keytab " + PathOf(m_aliceKeytab)));
   ExpectTokenOf("alice@corp.example", AcquireWith("--force " + cache));
@@ -128,27 +128,27 @@ TEST_F(AcquireByTicket, FailsWithoutATicketBeforeTheServiceIsAsked) {
   EXPECT_EQ("", m_service.GetLog());
 }
 
-TEST_F(AcquireByTicket, NamesTheHandlersClassInJson) {
+TEST_F(AcquireByTicket, ShowsTheHandlersExceptionClassInJson) {
   const Result result = AcquireWith("--format json");
   EXPECT_EQ(3, result.exitCode);
   EXPECT_THAT(result.err,
               StartsWith(R"({"schema":1,"error":{"class":"GssCredentialException","message":"No credentials in )"));
 }
 
-TEST_F(AcquireByTicket, FailsWithoutTheNamedCache) {
+TEST_F(AcquireByTicket, FailsWhenTheGivenCacheDoesNotExist) {
   LogIn();
   const std::string cache = m_realm.NameFile("no_such_cache");
   ExpectFailure(3, "credentials: No credentials in the credential cache " + cache + ": ", "No credentials cache found",
                 AcquireWith("--ccache " + cache));
 }
 
-TEST_F(AcquireByTicket, FailsWithoutTheKeytab) {
+TEST_F(AcquireByTicket, FailsWhenTheKeytabDoesNotExist) {
   LogIn();
   ExpectFailure(3, "credentials: No credentials in the keytab none.keytab: ", "No",
                 AcquireWith("--client-keytab none.keytab"));
 }
 
-TEST_F(AcquireByTicket, FailsWithAKeytabThatIsNone) {
+TEST_F(AcquireByTicket, FailsWithAFileThatIsNotAKeytab) {
   LogIn();
   m_folder.Write("garbage.keytab", "this is no keytab, whatever its name says");
   ExpectFailure(3, "credentials: No credentials in the keytab garbage.keytab: ", "",
@@ -162,7 +162,7 @@ TEST_F(AcquireByTicket, FailsForAServiceThatTheRealmDoesNotKnow) {
                 AcquireWith("--service nobody@localhost"));
 }
 
-TEST_F(AcquireByTicket, NegotiatesWithHttpAtTheAddressesHostWhenNoServiceIsNamed) {
+TEST_F(AcquireByTicket, NegotiatesWithHttpAtTheAddressesHostByDefault) {
   LogIn();
   const Result result = Run("ssoclient acquire --sts https://127.0.0.1:" + std::to_string(m_service.GetPort()) +
                             "/sts --ca ca.pem --trust sts.pem --gss --out token.xml");
@@ -170,7 +170,7 @@ TEST_F(AcquireByTicket, NegotiatesWithHttpAtTheAddressesHostWhenNoServiceIsNamed
                 "HTTP/127.0.0.1@", result);
 }
 
-TEST_F(AcquireByTicket, FailsForAServiceOfARealmThatOursDoesNotTrust) {
+TEST_F(AcquireByTicket, FailsForAServiceOfARealmThatTheClientsRealmDoesNotTrust) {
   LogIn();
   ExpectFailure(4, "communication failed: The negotiation with HTTP/localhost@OTHER.EXAMPLE failed: ",
                 "Server krbtgt/OTHER.EXAMPLE@CORP.EXAMPLE not found in Kerberos database",
@@ -197,19 +197,21 @@ TEST_F(AcquireByTicket, FailsWhenTheServiceNegotiatesWithoutAContext) {
                "was returned.\n");
 }
 
-TEST_F(AcquireByTicket, IsRefusedToAUserWhomTheServiceDoesNotKnow) {
+TEST_F(AcquireByTicket, IsRefusedForAUserThatTheServiceDoesNotKnow) {
   const std::string keytab = m_realm.AddPrincipal("mallory");
   ExpectResult(AcquireWith("--client-keytab " + PathOf(keytab)), 3, "",
-               "ssoclient: credentials refused: Authentication failed: mallory@CORP.EXAMPLE is none of the users\n");
+               "ssoclient: credentials refused: Authentication failed: unknown user mallory@CORP.EXAMPLE\n");
 }
 
-TEST_F(AcquireByTicket, IsAMistakeInTheCommandLineWithANameThatIsNoService) {
+TEST_F(AcquireByTicket, RefusesANameThatIsNotAServiceAsAWrongCommandLine) {
   LogIn();
-  ExpectResult(AcquireWith("--service HTTP"), 2, "",
-               "ssoclient: usage: Invalid argument : 'HTTP' is no service, as HTTP@host or HTTP/host@REALM\n");
+  ExpectResult(
+      AcquireWith("--service HTTP"), 2, "",
+      "ssoclient: usage: Invalid argument : 'HTTP' is not a service name such as HTTP@host or HTTP/host@REALM\n");
 }
 
-/// A clock that is two hours behind gives a ticket for one hour, which has expired an hour ago by everybody else's.
+/// The realm's clock is two hours slow. Its tickets are valid for one hour, so by every other clock they expired an
+/// hour ago.
 class AcquireByExpiredTicket : public AcquireByTicket {
 protected:
   AcquireByExpiredTicket() : AcquireByTicket({.name = "CORP.EXAMPLE", .clockOffsetSec = -7200, .adoptsClock = false}) {}
@@ -221,7 +223,7 @@ TEST_F(AcquireByExpiredTicket, SaysThatItHasExpired) {
                "ssoclient: credentials: The ticket in the default credential cache has expired\n");
 }
 
-/// A realm whose clock the client adopts, and the service does not.
+/// A realm with a wrong clock, which the client adopts and the service does not.
 class AcquireInARealmWithAWrongClock : public AcquireByTicket {
 protected:
   AcquireInARealmWithAWrongClock()

@@ -9,7 +9,8 @@
 namespace ToolTest {
 namespace {
 
-/// The long option, "--" included, at `at`, or behind a short one and `separator` there; empty for none.
+/// The long option at `at`, including its "--", possibly after a short option and `separator`; empty when there is
+/// none.
 std::string OptionAt(const std::string &text, std::size_t at, const std::string &separator) {
   const bool isShort = text[at] == '-' && text[at + 1] >= 'a' && text[at + 1] <= 'z';
   if (isShort && text.compare(at + 2, separator.size(), separator) == 0) {
@@ -39,7 +40,7 @@ std::set<std::string> OptionsWithArgument(const std::string &command) {
   const std::string help = RunTool({command, "--help"}).out;
   std::set<std::string> options;
   for (const std::string &option : OptionsOfHelp(command)) {
-    // The argument's name in capitals; the help of a flag begins further on, in its column.
+    // The argument's name follows in capitals; the help of a flag begins later, in its column.
     const std::size_t end = help.find(option + " ") + option.size();
     if (help[end + 1] >= 'A' && help[end + 1] <= 'Z') {
       options.insert(option);

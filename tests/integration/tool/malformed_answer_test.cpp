@@ -1,5 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
-// An answer that cannot be read is a fault of the service, and says nothing about a token.
+// An answer that cannot be read is a fault of the service, and says nothing about the caller's token.
 
 #include "expect_result.h"
 #include "process.h"
@@ -62,7 +62,7 @@ TEST(MalformedToken, ThatTheServiceIssuesIsAFaultOfTheService) {
       "ssoclient: service fault: No canonical form: the prefix \"nobody\" is not bound at line 2, column 370\n");
 }
 
-TEST(MalformedResponse, ToARequestThatIsDoubtfulHasNoHint) {
+TEST(MalformedResponse, ToADoubtfulRequestHasNoHint) {
   const Testing::PostingServer server({"<html/>"});
   ExpectResult(RunShell(ACQUIRE +
                         std::string("--cert holder.crt --key holder.key --delegate-to bob --format json --sts ") +

@@ -1,5 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
-// The manual tells what the help tells: the same options, the same exit codes.
+// The manual lists the same options and exit codes as the help.
 
 #include "built_files.h"
 #include "help_options.h"
@@ -18,7 +18,7 @@
 namespace ToolTest {
 namespace {
 
-/// The manual without the escapes that its text needs there.
+/// The text of the manual, without its escapes.
 std::string ReadManual() {
   std::ifstream file(ProjectPath("docs/man/ssoclient.1"));
   std::string text{std::istreambuf_iterator<char>(file), {}};
@@ -28,7 +28,7 @@ std::string ReadManual() {
   return Fill(text, "\\-", "-");
 }
 
-/// The options that the manual gives a paragraph of their own, in whatever fonts.
+/// The options that have a paragraph of their own in the manual, in any font.
 std::set<std::string> OptionsOfManual() {
   const std::string manual = ReadManual();
   std::set<std::string> options;
@@ -40,7 +40,7 @@ std::set<std::string> OptionsOfManual() {
   return options;
 }
 
-/// `line` with one blank between the number that it begins with and the text behind that.
+/// `line` with one blank between the number at its beginning and the text after it.
 std::string WithOneBlank(const std::string &line) {
   const std::size_t number = line.find_first_not_of(' ');
   const std::size_t blanks = line.find_first_not_of("0123456789", number);
@@ -51,7 +51,7 @@ std::string WithOneBlank(const std::string &line) {
   return line.substr(number, blanks - number) + " " + line.substr(text);
 }
 
-/// The lines from behind `begin` to `end`, each number and the text behind it with one blank between.
+/// The lines from `begin` to `end`, each with one blank between its number and the text after it.
 std::string TableIn(const std::string &text, const std::string &begin, const std::string &end) {
   const std::size_t first = text.find(begin) + begin.size();
   std::istringstream lines(text.substr(first, text.find(end, first) - first));
@@ -62,7 +62,7 @@ std::string TableIn(const std::string &text, const std::string &begin, const std
   return table;
 }
 
-TEST(Manual, TellsTheOptionsOfTheHelpAndNoOthers) {
+TEST(Manual, ListsExactlyTheOptionsOfTheHelp) {
   std::set<std::string> helped;
   for (const char *command : {"acquire", "renew", "validate", "verify", "inspect"}) {
     helped.merge(OptionsOfHelp(command));
@@ -72,7 +72,7 @@ TEST(Manual, TellsTheOptionsOfTheHelpAndNoOthers) {
   EXPECT_EQ(helped, OptionsOfManual());
 }
 
-TEST(Manual, TellsTheExitCodesOfTheHelp) {
+TEST(Manual, ListsTheExitCodesOfTheHelp) {
   const std::string codes = TableIn(ReadManual(), "\nl l.\n", "\n.TE\n");
   EXPECT_EQ(TableIn(RunTool({"--help"}).out, "Exit codes:\n", "\n\n"), codes);
   EXPECT_EQ(0u, codes.find("0 done; for validate: the token is valid\n1 unexpected failure\n")) << codes;

@@ -97,7 +97,7 @@ void Drain(Pipe &pipe, std::string &text) {
   text.append(buffer.data(), static_cast<std::size_t>(count));
 }
 
-/// Feeds `input` and gathers both outputs at once, so that neither side waits for the other for ever.
+/// Writes `input` and reads both outputs at the same time, so that neither side blocks the other.
 void Exchange(Process &process, std::string_view input, Result &result) {
   std::signal(SIGPIPE, SIG_IGN);
   fcntl(process.in.writeEnd, F_SETFL, O_NONBLOCK);
@@ -180,7 +180,7 @@ Result RunToolAndSignal(const std::vector<std::string> &arguments, int signal) {
   Process process;
   Result result;
   Start(process, ToolCommand(arguments), Testing::DataPath("tokens"));
-  // No event tells from outside that a process has come to catch a signal, so its state is asked for.
+  // No event reports to another process that this one now catches a signal, so this asks for its state again and again.
   while (!Catches(process.id, signal)) {
     if (waitpid(process.id, nullptr, WNOHANG) != 0) {
       throw std::runtime_error("the tool ended before it caught the signal");

@@ -17,8 +17,9 @@ struct Result {
   std::string err;
 };
 
-/// For a new process before it becomes another program: signals do what they do in a shell's foreground. Whoever started
-/// the tests may ignore some, as a shell does for its background work, and a program inherits that.
+/// To be called in a new process before it executes another program: resets signals to what they do in a shell's
+/// foreground. The parent of the tests may ignore some, as a shell does for background jobs, and a program inherits
+/// that.
 void HeedSignals();
 
 /// The words that start the tool with `arguments`.
@@ -33,8 +34,8 @@ Result RunTool(const std::vector<std::string> &arguments, const std::string &inp
 /// Runs `commandLine` by the shell, in `folder`, as `ShellCommand` says.
 Result RunShell(const std::string &commandLine, const std::string &folder = Testing::DataPath("tokens"));
 
-/// Starts the tool with a standard input that stays open and silent, sends it `signal` once it catches that signal, and
-/// returns how it ended.
+/// Starts the tool with a standard input that stays open and silent, sends it `signal` as soon as it catches that
+/// signal, and returns how it ended.
 Result RunToolAndSignal(const std::vector<std::string> &arguments, int signal);
 
 } // namespace ToolTest

@@ -49,14 +49,14 @@ TEST_F(Renew, GivesANewTokenAndLeavesTheOldOne) {
   EXPECT_EQ(before, m_folder.Read("token.xml"));
 }
 
-TEST_F(Renew, PutsTheNewTokenInPlaceOfTheOldOne) {
+TEST_F(Renew, ReplacesTheOldTokenWithTheNewOne) {
   const std::string before = m_folder.Read("token.xml");
   const Result result = Run("ssoclient renew " + Service() + IDENTITY + "--out token.xml --force - <token.xml");
   EXPECT_EQ(0, result.exitCode) << result.err;
   EXPECT_NE(AttributeIn(before, "ID"), AttributeIn(m_folder.Read("token.xml"), "ID"));
 }
 
-TEST_F(Renew, IsRefusedToTheHolderOfAnotherKey) {
+TEST_F(Renew, IsRefusedForAnotherKeyThanTheTokens) {
   ExpectResult(Run("ssoclient renew " + Service() + OTHER_IDENTITY + "token.xml"), 3, "",
                "ssoclient: credentials refused: Authentication failed: the renewal is not signed by the holder of the "
                "token's key\n");
@@ -81,8 +81,8 @@ TEST_F(Renew, RefusesTheServicesWrongAnswers) {
   EXPECT_EQ(0u, m_folder.Names().count("renewed.xml"));
 }
 
-TEST_F(Renew, HoldsTheNewTokenToANarrowerTolerance) {
-  // The old token lasts for a day, the new one for no longer than is taken off.
+TEST_F(Renew, ChecksTheNewTokenWithANarrowerTolerance) {
+  // The old token is valid for a day. The new one is valid for one second, and the tolerance removes that second.
   Acquire("long.xml", std::string(IDENTITY) + "--renewable --lifetime 1d");
   const Result result =
       Run("ssoclient renew " + Service() + IDENTITY + "--tolerance -1 --lifetime 1s --out renewed.xml long.xml");
@@ -102,7 +102,7 @@ TEST_F(Validate, SaysThatATokenIsValid) {
 }
 
 TEST_F(Validate, SaysThatATokenIsNotValid) {
-  // Trusted here, but none of the service's tokens.
+  // Signed with a key that is trusted here, but not issued by the service.
   const std::string tokens = Testing::DataPath("tokens/");
   const std::string foreign = "--trust " + tokens + "sts-rsa.crt " + tokens + "bearer.xml";
   ExpectResult(Run("ssoclient validate " + Service() + foreign), 5, "invalid\n", "");
@@ -137,7 +137,7 @@ TEST_F(Validate, ReportsAStandardStreamThatIsClosed) {
   ExpectResult(Run("ssoclient validate " + Service() + "- <&-"), 7, "", "ssoclient: file: -: Bad file descriptor\n");
 }
 
-TEST_F(Validate, ShowsTheLibrarysLogAndNoTokenInIt) {
+TEST_F(Validate, ShowsTheLibrarysLogWithoutATokenInIt) {
   const Result result = Run("ssoclient validate -v " + Service() + "token.xml");
   EXPECT_EQ("valid\n", result.out);
   EXPECT_THAT(result.err, HasSubstr(" START operation SecurityTokenServiceImpl::ValidateSubject\n"));

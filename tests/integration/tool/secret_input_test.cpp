@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
-// How the tool takes passwords and passphrases, told from outside. Nobody listens at the address, so a run that has read
-// its secrets ends with 4.
+// How the tool reads passwords and passphrases, seen from outside. No service listens at the address, so a run that has
+// read its secrets ends with 4.
 
 #include "closed_port.h"
 #include "expect_result.h"
@@ -54,7 +54,7 @@ protected:
   std::vector<std::string> m_acquire;
 };
 
-TEST_F(SecretInput, AsksAtTheTerminalWithoutEcho) {
+TEST_F(SecretInput, PromptsAtTheTerminalWithoutEcho) {
   TerminalSession session(Acquire({"--user", "alice@corp.example"}), TOKENS);
   session.WaitFor("Password for alice@corp.example: ");
   EXPECT_FALSE(session.Echoes());
@@ -66,7 +66,7 @@ TEST_F(SecretInput, AsksAtTheTerminalWithoutEcho) {
             session.Shown());
 }
 
-TEST_F(SecretInput, AsksAtTheTerminalAlsoWhenStandardInputIsAnotherFile) {
+TEST_F(SecretInput, PromptsAtTheTerminalEvenWhenStandardInputIsAnotherFile) {
   TerminalSession session(Acquire({"--key", KEYS + "/rsa2048-encrypted.key", "--cert", KEYS + "/rsa2048.crt"}), TOKENS);
   session.WaitFor("/rsa2048-encrypted.key: ");
   EXPECT_FALSE(session.Echoes());
@@ -75,7 +75,7 @@ TEST_F(SecretInput, AsksAtTheTerminalAlsoWhenStandardInputIsAnotherFile) {
   EXPECT_EQ(0u, session.Shown().find("Passphrase for " + KEYS + "/rsa2048-encrypted.key: \r\n"));
 }
 
-TEST_F(SecretInput, MakesTheTerminalQuietAlsoWhenItIsNamedAsFile) {
+TEST_F(SecretInput, MakesTheTerminalQuietEvenWhenItIsGivenAsAFile) {
   TerminalSession session(Acquire({"--user", "alice", "--password-file", "-"}), TOKENS);
   session.WaitFor("Password for alice: ");
   EXPECT_FALSE(session.Echoes());
@@ -85,7 +85,7 @@ TEST_F(SecretInput, MakesTheTerminalQuietAlsoWhenItIsNamedAsFile) {
   EXPECT_EQ(std::string::npos, session.Shown().find("wonderland"));
 }
 
-TEST_F(SecretInput, ShowsAPromptThatCannotSteerTheTerminal) {
+TEST_F(SecretInput, ShowsAPromptThatCannotControlTheTerminal) {
   TerminalSession session(Acquire({"--user", "al\x1B[2Jice"}), TOKENS);
   session.WaitFor("Password for al\\u001B[2Jice: ");
 }
@@ -130,12 +130,12 @@ TEST_F(SecretInput, RefusesTheEndOfInputAtThePrompt) {
   EXPECT_EQ("Password for alice: ssoclient: file: terminal: there is no password\r\n", session.Shown());
 }
 
-TEST_F(SecretInput, WantsAnOptionWhereThereIsNoTerminal) {
+TEST_F(SecretInput, NeedsAnOptionWhenThereIsNoTerminal) {
   ExpectResult(RunShell("setsid -w " + ShellLine("--user alice")), 2, "",
-               "ssoclient: usage: there is no terminal to ask for the password at; give --password-file or "
+               "ssoclient: usage: there is no terminal to prompt for the password; give --password-file or "
                "--password-fd\n");
   ExpectResult(RunShell("setsid -w " + ShellLine("--cert rsa2048.crt --key rsa2048-encrypted.key"), KEYS), 2, "",
-               "ssoclient: usage: there is no terminal to ask for the passphrase at; give --passphrase-file or "
+               "ssoclient: usage: there is no terminal to prompt for the passphrase; give --passphrase-file or "
                "--passphrase-fd\n");
 }
 
@@ -160,7 +160,7 @@ TEST_F(SecretInput, ReadsAPassphraseFromAFileAndFromStandardInputAndFromADescrip
   }
 }
 
-TEST_F(SecretInput, AsksForNoPassphraseWhereNoneIsNeeded) {
+TEST_F(SecretInput, DoesNotPromptForAPassphraseThatIsNotNeeded) {
   for (const char *key : {"--cert rsa2048.crt --key rsa2048.key", "--p12 rsa2048-no-passphrase.p12",
                           "--cert rsa2048.crt --key rsa2048.key --passphrase-file missing"}) {
     ExpectResult(RunShell("setsid -w " + ShellLine(key), KEYS), 4, "", Unreachable());
@@ -181,7 +181,7 @@ TEST_F(SecretInput, RefusesAWrongPassphrase) {
                "ssoclient: passphrase: rsa2048.p12: The passphrase of the PKCS#12 key store is wrong\n");
 }
 
-TEST_F(SecretInput, RefusesASecretThatIsNotThere) {
+TEST_F(SecretInput, RefusesAMissingSecret) {
   m_folder.Write("empty", "");
   const auto run = [&](const std::string &source) {
     return RunShell(ShellLine("--user alice ") + source, m_folder.Path());
@@ -193,7 +193,7 @@ TEST_F(SecretInput, RefusesASecretThatIsNotThere) {
   ExpectResult(run("--password-fd 9"), 7, "", "ssoclient: file: descriptor 9: Bad file descriptor\n");
 }
 
-TEST_F(SecretInput, TakesASecretOf4096OctetsAndNoLongerOne) {
+TEST_F(SecretInput, AcceptsASecretOf4096OctetsButNoLongerOne) {
   m_folder.Write("longest", std::string(4096, 'p') + "\n");
   m_folder.Write("too-long", std::string(4097, 'p') + "\n");
   const auto run = [&](const std::string &file) {

@@ -25,7 +25,7 @@ struct Refusal {
   int exitCode;
   const char *exceptionClass;
   const char *label;
-  const char *message; ///< as in text; of what JSON escapes, it holds double quotes alone
+  const char *message; ///< as in text; of the characters that JSON escapes, it contains only double quotes
 };
 
 #define STS "--sts https://127.0.0.1:9/sts --trust sts-rsa.crt "
@@ -95,7 +95,7 @@ const Refusal REFUSALS[] = {
     {"ExchangeWithoutIdentity", "acquire " STS "--token bearer.xml", USAGE,
      "--token needs an identity to sign with; give --cert and --key, or --p12"},
     {"BearerByIdentityAlone", "acquire " STS "--bearer --cert holder.crt --key holder.key", USAGE,
-     "--bearer does not go with an identity alone, whose token is bound to its key"},
+     "--bearer cannot be combined with an identity alone, whose token is bound to its key"},
     {"StandardInputTwice", "acquire " STS "--p12 x.p12 --passphrase-file - --user alice --password-file -", USAGE,
      "--password-file and --passphrase-file cannot both read standard input"},
     {"StandardInputTwiceByDescriptor", "renew " STS "--p12 x.p12 --passphrase-fd 0 -", USAGE,
@@ -103,11 +103,11 @@ const Refusal REFUSALS[] = {
     {"DescriptorTwice", "acquire " STS "--p12 x.p12 --passphrase-fd 3 --user alice --password-fd 3", USAGE,
      "--password-fd and --passphrase-fd cannot both read descriptor 3"},
     {"LifetimeOfNoNumber", "acquire " STS "--user alice --lifetime soon", USAGE,
-     "--lifetime must be a number and s, m, h or d, such as 8h"},
+     "--lifetime must be a duration such as 8h (units: s, m, h, d)"},
     {"LifetimeOfAnUnknownUnit", "acquire " STS "--user alice --lifetime 8w", USAGE,
-     "--lifetime must be a number and s, m, h or d, such as 8h"},
+     "--lifetime must be a duration such as 8h (units: s, m, h, d)"},
     {"LifetimeOfAUnitAlone", "acquire " STS "--user alice --lifetime h", USAGE,
-     "--lifetime must be a number and s, m, h or d, such as 8h"},
+     "--lifetime must be a duration such as 8h (units: s, m, h, d)"},
     {"LifetimeOfZero", "acquire " STS "--user alice --lifetime 0h", USAGE, "--lifetime must be positive"},
     {"NegativeLifetime", "renew " STS "--p12 x.p12 --lifetime=-1h token.xml", USAGE, "--lifetime must be positive"},
     {"LifetimeBeyondACentury", "acquire " STS "--user alice --lifetime 36601d", USAGE,
@@ -125,11 +125,11 @@ const Refusal REFUSALS[] = {
     {"AdviceWithoutValue", "acquire " STS "--user alice --advice urn:a:color", USAGE,
      "--advice 'urn:a:color' is not of the form SOURCE:NAME=VALUE"},
     {"PlainHttp", "acquire --sts http://127.0.0.1:9/ --trust sts-rsa.crt --user alice", USAGE,
-     "--sts is a plain http address, on which everybody can read along; --allow-http permits it"},
+     "--sts is a plain http address, which is not encrypted; --allow-http permits it"},
     {"PlainHttpForRenewal", "renew --sts HTTP://127.0.0.1:9/ --trust sts-rsa.crt --p12 x.p12 t.xml", USAGE,
-     "--sts is a plain http address, on which everybody can read along; --allow-http permits it"},
+     "--sts is a plain http address, which is not encrypted; --allow-http permits it"},
     {"PlainHttpForValidation", "validate --sts http://127.0.0.1:9/ --trust sts-rsa.crt bearer.xml", USAGE,
-     "--sts is a plain http address, on which everybody can read along; --allow-http permits it"},
+     "--sts is a plain http address, which is not encrypted; --allow-http permits it"},
     {"AuthorityForPlainHttp",
      "validate --sts http://127.0.0.1:9/ --allow-http --ca sts-rsa.crt --trust sts-rsa.crt bearer.xml", USAGE,
      "--ca and --thumbprint protect nothing on a plain http address"},
@@ -175,18 +175,18 @@ const Refusal REFUSALS[] = {
     {"KeyThatIsNotRsa", "acquire " STS "--cert ../crypto/p256.crt --key ../crypto/p256.key", 7, "CryptoException",
      "key or certificate", "../crypto/p256.key: only an RSA key signs requests, and this is EC"},
     {"OutputThatIsThere", "acquire " STS "--user alice --out full.xml", 7, "IOException", "file",
-     "full.xml: is there already; --force replaces it"},
+     "full.xml: already exists; --force replaces it"},
     {"OutputThatIsAFolder", "acquire " STS "--user alice --out templates --force", 7, "IOException", "file",
-     "templates: is no regular file"},
+     "templates: is not a regular file"},
     {"OutputThatIsADevice", "acquire " STS "--user alice --out /dev/null --force", 7, "IOException", "file",
-     "/dev/null: is no regular file"},
+     "/dev/null: is not a regular file"},
     {"OutputInAMissingFolder", "renew " STS "--p12 x.p12 --out missing/token.xml full.xml", 7, "IOException", "file",
      "missing/token.xml: No such file or directory"},
 };
 
 class ServiceRefusal : public testing::TestWithParam<Refusal> {
 protected:
-  // Without a terminal, so that a run that should have been refused does not ask whoever runs the tests.
+  // Without a terminal, so that a run that is not refused as expected does not prompt at the terminal of the tests.
   static Result Run(const std::string &more) {
     return RunShell(std::string("setsid -w ssoclient ") + GetParam().commandLine + more);
   }
@@ -234,7 +234,7 @@ std::string WithColons(const std::string &digits) {
   return text;
 }
 
-TEST(Thumbprint, IsTakenWithAllColonsOrWithNone) {
+TEST(Thumbprint, IsAcceptedWithAllColonsOrWithNone) {
   const ClosedPort port;
   for (const std::string &thumbprint : {std::string(THUMBPRINT), WithColons(THUMBPRINT)}) {
     ExpectResult(RunShell("ssoclient validate --trust sts-rsa.crt --sts https://" + port.HostAndPort() +
@@ -261,9 +261,9 @@ TEST(Thumbprint, OfAnyOtherFormIsAWrongCommandLine) {
   }
 }
 
-TEST(ServiceCommandLine, AsksForNoVerdictInXml) {
+TEST(ServiceCommandLine, RefusesAVerdictInXml) {
   ExpectResult(RunShell("ssoclient validate " STS "--format xml bearer.xml"), 2, "",
-               "ssoclient: usage: a verdict has no form in XML; give --format text or json\n");
+               "ssoclient: usage: a verdict has no XML form; give --format text or json\n");
 }
 
 TEST(Service, ThatCannotBeReachedEndsEachCommandWith4) {

@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// The tool beside a running development service.
+/// Runs the tool with a running development service.
 
 #pragma once
 
@@ -22,7 +22,7 @@ namespace ToolTest {
 
 using Testing::WorkFolder;
 
-/// Each test has the service, and a folder with ca.pem (who vouches for the server), sts.pem (who signs tokens), the
+/// Each test has the service, and a folder with ca.pem (the server's authority), sts.pem (the token signer), the
 /// identities client and other-client as NAME.pem and NAME.key, and password.txt and wrong.txt.
 class ServiceTest : public testing::Test {
 protected:
@@ -41,7 +41,7 @@ protected:
     m_folder.Write("wrong.txt", "looking-glass\n");
   }
 
-  /// The options that lead to the service, or to one fault of it.
+  /// The options for the service, or for one of its faults.
   std::string Service(const std::string &fault = {}) const {
     const std::string url = fault.empty() ? m_service.GetUrl() : m_service.FaultUrl(fault);
     return "--sts " + url + " --ca ca.pem --trust sts.pem ";

@@ -1,5 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
-// OpenSSL's configuration counts for the tool when it is asked to heed it, and only then.
+// The tool uses OpenSSL's configuration only when it is asked to.
 #include "process.h"
 
 #include "support/work_folder.h"
@@ -11,7 +11,7 @@
 namespace ToolTest {
 namespace {
 
-/// The tool where OpenSSL's configuration file says `configuration`.
+/// Runs the tool with an OpenSSL configuration file that contains `configuration`.
 Result RunConfigured(const std::string &configuration, const std::string &arguments) {
   const Testing::WorkFolder folder;
   return RunShell("OPENSSL_CONF='" + folder.Write("openssl.cnf", configuration) + "' ssoclient " + arguments);
@@ -29,8 +29,8 @@ TEST(SystemCrypto, IsNotUsedUnlessItIsAskedFor) {
 }
 
 TEST(SystemCrypto, IsUsedWhenItIsAskedFor) {
-  const Result good = RunConfigured("", "verify --system-crypto --trust sts-rsa.crt bearer.xml");
-  EXPECT_EQ(good.exitCode, 0) << good.err;
+  const Result accepted = RunConfigured("", "verify --system-crypto --trust sts-rsa.crt bearer.xml");
+  EXPECT_EQ(accepted.exitCode, 0) << accepted.err;
   const Result refused = RunConfigured(REFUSED_BY_OPENSSL, "verify --system-crypto --trust sts-rsa.crt bearer.xml");
   EXPECT_EQ(refused.exitCode, 7);
   EXPECT_EQ(refused.err.rfind("ssoclient: key or certificate: Cannot initialise OpenSSL: error:", 0), 0u)

@@ -11,8 +11,8 @@
 
 namespace ToolTest {
 
-/// A command at a new pseudo-terminal, which is its standard input, output and error, and its controlling terminal. What
-/// waits gives up after half a minute by an exception.
+/// A command at a new pseudo-terminal, which is its standard input, output and error, and its controlling terminal.
+/// Every wait throws an exception after half a minute.
 class TerminalSession {
 public:
   /// Starts the program `words[0]` in `folder`.
@@ -26,11 +26,11 @@ public:
   void Type(const std::string &text);
   /// Whether the terminal echoes what is typed.
   bool Echoes() const;
-  /// Whether the process is stopped, asked without waiting.
+  /// Whether the process is stopped. Does not wait.
   bool IsStopped() const;
 
   void Signal(int signal);
-  /// The exit code, or 128 plus the signal that ended the process; reads what is still shown.
+  /// Reads the rest of the output. Returns the exit code, or 128 plus the signal that ended the process.
   int Finish();
 
   /// All that the terminal has shown so far, its line ends as CR LF.
@@ -40,7 +40,7 @@ private:
   bool ReadSome(int timeoutMs);
 
   int m_master = -1;
-  int m_slave = -1; ///< kept open, so that the settings can be asked for after the process has ended
+  int m_slave = -1; ///< kept open, so that the settings can be read after the process has ended
   pid_t m_process = -1;
   std::string m_shown;
 };

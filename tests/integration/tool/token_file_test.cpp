@@ -1,5 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
-// The file that a token is written to: whole or not at all, for its owner alone.
+// The file that a token is written to: whole or not at all, and only for its owner.
 
 #include "built_files.h"
 #include "expect_result.h"
@@ -43,7 +43,7 @@ protected:
   std::set<std::string> m_before;
 };
 
-TEST_F(TokenFile, IsReadableForItsOwnerAloneWhateverTheMask) {
+TEST_F(TokenFile, IsReadableOnlyForItsOwnerWhateverTheMask) {
   EXPECT_EQ(0, Run("umask 000; " + Line()).exitCode);
   EXPECT_EQ(0600u, Mode("token.xml"));
   EXPECT_TRUE(IsToken("token.xml"));
@@ -52,12 +52,12 @@ TEST_F(TokenFile, IsReadableForItsOwnerAloneWhateverTheMask) {
 
 TEST_F(TokenFile, IsNotReplacedWithoutForce) {
   m_folder.Write("token.xml", "what was there");
-  ExpectResult(Run(Line()), 7, "", "ssoclient: file: token.xml: is there already; --force replaces it\n");
+  ExpectResult(Run(Line()), 7, "", "ssoclient: file: token.xml: already exists; --force replaces it\n");
   EXPECT_EQ("what was there", m_folder.Read("token.xml"));
   EXPECT_EQ("", m_service.GetLog()); // nothing was asked of the service
 }
 
-TEST_F(TokenFile, IsReplacedByForceAndThenForItsOwnerAlone) {
+TEST_F(TokenFile, IsReplacedWithForceAndThenReadableOnlyForItsOwner) {
   m_folder.Write("token.xml", std::string(1 << 20, 'x'));
   EXPECT_EQ(0, Run(Line() + "--force").exitCode);
   EXPECT_EQ(0600u, Mode("token.xml"));
@@ -65,31 +65,33 @@ TEST_F(TokenFile, IsReplacedByForceAndThenForItsOwnerAlone) {
   EXPECT_EQ(WithToken(), m_folder.Names());
 }
 
-TEST_F(TokenFile, ThatComesMeanwhileIsNotReplacedWithoutForce) {
+TEST_F(TokenFile, ThatIsCreatedInTheMeantimeIsNotReplacedWithoutForce) {
   TerminalSession session(
       ShellCommand("exec ssoclient acquire " + Service() + "--user alice@corp.example --format xml --out token.xml"),
       m_folder.Path());
   session.WaitFor("Password for alice@corp.example: "); // by then the tool has seen that there is no such file
-  m_folder.Write("token.xml", "what came meanwhile");
+  m_folder.Write("token.xml", "from another program");
   session.Type("wonderland\n");
   EXPECT_EQ(7, session.Finish());
   EXPECT_EQ("Password for alice@corp.example: \r\n"
-            "ssoclient: file: token.xml: is there already; --force replaces it\r\n",
+            "ssoclient: file: token.xml: already exists; --force replaces it\r\n",
             session.Shown());
   EXPECT_NE(std::string::npos, m_service.GetLog().find(": issued")) << m_service.GetLog();
-  EXPECT_EQ("what came meanwhile", m_folder.Read("token.xml"));
+  EXPECT_EQ("from another program", m_folder.Read("token.xml"));
   EXPECT_EQ(WithToken(), m_folder.Names());
 }
 
-TEST_F(TokenFile, IsNotThereWhenItCannotBeWrittenWhole) {
+TEST_F(TokenFile, IsNotCreatedWhenItCannotBeWrittenWhole) {
   ExpectResult(Run("ulimit -f 1; " + Line()), 7, "", "ssoclient: file: token.xml: File too large\n");
   EXPECT_EQ(m_before, m_folder.Names());
 }
 
-TEST_F(TokenFile, IsThereAndNotReportedAsFailedWhenStandardOutputFails) {
+TEST_F(TokenFile, IsKeptWithAWarningWhenStandardOutputFails) {
   const std::string line = "ssoclient acquire " + Service() + PASSWORD + "--out token.xml ";
-  const std::string full = "token.xml is written, but not what it says: standard output: No space left on device";
-  const std::string closed = "token.xml is written, but not what it says: standard output: Bad file descriptor";
+  const std::string full =
+      "token.xml was written, but what it says cannot be shown: standard output: No space left on device";
+  const std::string closed =
+      "token.xml was written, but what it says cannot be shown: standard output: Bad file descriptor";
   ExpectResult(Run(line + ">/dev/full"), 0, "", "ssoclient: warning: " + full + "\n");
   EXPECT_TRUE(IsToken("token.xml"));
   EXPECT_EQ(WithToken(), m_folder.Names());
@@ -105,7 +107,7 @@ TEST_F(TokenFile, NeedsNoStandardOutputWhenTheFormatIsXml) {
   }
 }
 
-TEST_F(TokenFile, IsNotThereWhenItWasToGoToAStandardOutputThatFails) {
+TEST_F(TokenFile, IsNotCreatedWhenTheTokenIsForAStandardOutputThatFails) {
   for (const char *options : {"", "--out -", "--format xml", "--format json -v"}) {
     const Result result = Run("ssoclient acquire " + Service() + PASSWORD + options + " >/dev/full");
     EXPECT_EQ(7, result.exitCode) << options;
@@ -120,7 +122,7 @@ TEST_F(TokenFile, StaysAsItWasWhenItCannotBeReplacedWhole) {
   EXPECT_EQ(WithToken(), m_folder.Names());
 }
 
-TEST_F(TokenFile, IsWrittenWholeWhenTheToolIsToldToEndMeanwhile) {
+TEST_F(TokenFile, IsWrittenWholeWhenASignalArrivesDuringTheWrite) {
   for (const int signal : {SIGINT, SIGTERM, SIGHUP}) {
     const Result result = Run("SIGNAL_AT_FSYNC=" + std::to_string(signal) +
                               " ASAN_OPTIONS=verify_asan_link_order=0 LD_PRELOAD=" + InterruptingFsyncPath() +
@@ -132,7 +134,7 @@ TEST_F(TokenFile, IsWrittenWholeWhenTheToolIsToldToEndMeanwhile) {
   }
 }
 
-TEST_F(TokenFile, IsNotThereWhenTheToolIsInterruptedWhileItWaitsForTheService) {
+TEST_F(TokenFile, IsNotCreatedWhenTheToolIsInterruptedWhileItWaitsForTheService) {
   TerminalSession session(ShellCommand("exec " + Line("stall")), m_folder.Path());
   AwaitLog("/sts/fault/stall: fault");
   session.Type("\x03"); // Ctrl-C
@@ -140,7 +142,7 @@ TEST_F(TokenFile, IsNotThereWhenTheToolIsInterruptedWhileItWaitsForTheService) {
   EXPECT_EQ(m_before, m_folder.Names());
 }
 
-TEST_F(TokenFile, IsNotThereWhenTheToolIsTerminatedWhileItWaitsForTheService) {
+TEST_F(TokenFile, IsNotCreatedWhenTheToolIsTerminatedWhileItWaitsForTheService) {
   TerminalSession session(ShellCommand("exec " + Line("stall")), m_folder.Path());
   AwaitLog("/sts/fault/stall: fault");
   session.Signal(SIGTERM);
@@ -148,17 +150,17 @@ TEST_F(TokenFile, IsNotThereWhenTheToolIsTerminatedWhileItWaitsForTheService) {
   EXPECT_EQ(m_before, m_folder.Names());
 }
 
-TEST_F(TokenFile, IsRefusedInPlaceOfALinkADeviceOrAFolder) {
+TEST_F(TokenFile, DoesNotReplaceALinkADeviceOrAFolder) {
   std::filesystem::create_symlink("elsewhere.xml", m_folder / "link.xml");
   std::filesystem::create_directory(m_folder / "folder");
   for (const char *file : {"link.xml", "folder", "/dev/null"}) {
     ExpectResult(Run("ssoclient acquire " + Service() + PASSWORD + "--force --out " + file), 7, "",
-                 std::string("ssoclient: file: ") + file + ": is no regular file\n");
+                 std::string("ssoclient: file: ") + file + ": is not a regular file\n");
   }
   EXPECT_EQ("", m_service.GetLog());
 }
 
-TEST_F(TokenFile, MayStandInAnotherFolder) {
+TEST_F(TokenFile, MayBeInAnotherFolder) {
   std::filesystem::create_directory(m_folder / "folder");
   EXPECT_EQ(0, Run("ssoclient acquire " + Service() + PASSWORD + "--out folder/token.xml").exitCode);
   EXPECT_EQ(0, Run("ssoclient acquire " + Service() + PASSWORD + "--out " + m_folder / "folder/other.xml").exitCode);

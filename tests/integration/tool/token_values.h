@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// What differs from token to token, taken from its XML.
+/// Values that differ from token to token, read from its XML.
 
 #pragma once
 
@@ -14,8 +14,8 @@ std::string AttributeIn(const std::string &xml, const std::string &name);
 /// `text` with each `mark` replaced by `value`.
 std::string Fill(std::string text, const std::string &mark, const std::string &value);
 
-/// `text` with @ID@, @NOT_BEFORE@ and @NOT_ON_OR_AFTER@ replaced by the values of the token `xml`. The validity stands in
-/// the element Conditions; a bearer token has a further end of its own in its confirmation.
+/// `text` with @ID@, @NOT_BEFORE@ and @NOT_ON_OR_AFTER@ replaced by the values of the token `xml`. The validity is in
+/// the element Conditions; the confirmation of a bearer token has another NotOnOrAfter.
 std::string FillFrom(const std::string &xml, std::string text);
 
 } // namespace ToolTest

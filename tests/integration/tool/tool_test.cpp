@@ -1,8 +1,9 @@
 // SPDX-License-Identifier: Apache-2.0
-// What the tool prints and how it ends, whole.
+// What the tool prints, asserted whole, and how it ends.
 
 #include "expect_result.h"
 #include "process.h"
+#include "token_values.h"
 
 #include "support/data_file.h"
 
@@ -12,6 +13,7 @@
 #include <filesystem>
 #include <fstream>
 #include <string>
+#include <utility>
 #include <vector>
 
 #include <unistd.h>
@@ -21,154 +23,25 @@ namespace {
 
 using Testing::ReadDataFile;
 
-constexpr const char *FULL_TEXT = R"(Id:              _a18b869b-2e81-c0c5-2955-2a3c4fa5c92e
-Subject:         alice@corp.example
-First name:      Alice
-Last name:       Liddell
-Confirmation:    holder-of-key
-Not before:      2020-01-01T00:00:00.000Z
-Not on or after: 2120-01-01T00:00:00.000Z
-Renewable:       yes
-Delegable:       yes
-Solution:        yes
-Group:           corp.example\Administrators
-Group:           corp.example\Users
-Group:           corp.example\Ops\Night Shift
-Delegate:        gateway@corp.example at 2020-01-01T00:00:01.250Z
-Delegate:        backup@corp.example at 2020-01-01T00:00:02.000Z
-Audience:        https://files.corp.example/
-Audience:        https://mail.corp.example/
-Advice:          urn:corp.example:mapper
-                 urn:corp.example:advice:color
-                 = green
-                 = blue
-                 urn:corp.example:advice:empty
-Advice:          urn:corp.example:audit
-Certificate:     CN=holder,O=Example
-                 SHA-256 @HOLDER_SHA256@
-)";
-
-/// The thumbprint of the fixtures' holder, which is made anew when the fixtures are.
+/// The thumbprint of the fixtures' holder, which changes when the fixtures are made again.
 std::string HolderSha256() {
   const Result result = RunShell(
       "openssl x509 -in holder.crt -noout -fingerprint -sha256 | sed 's/.*=//;s/://g' | tr -d '\\n' | tr A-F a-f");
   return result.out;
 }
 
-std::string WithHolder(std::string text) {
+/// The expected output in tests/data/tool, with the thumbprint filled in.
+std::string Expected(const std::string &file) {
+  std::string text = ReadDataFile("tool/" + file);
   const std::string mark = "@HOLDER_SHA256@";
-  return text.replace(text.find(mark), mark.size(), HolderSha256());
+  return text.find(mark) == std::string::npos ? text : Fill(std::move(text), mark, HolderSha256());
 }
 
-constexpr const char *MINIMAL_JSON = R"({
-  "schema": 1,
-  "verified": @VERIFIED@,
-  "id": "_6786bdef-ac00-81c1-bcc9-518978be1746",
-  "subject": {
-    "name": "alice",
-    "domain": "corp.example"
-  },
-  "confirmation": "bearer",
-  "notBefore": "2020-01-01T00:00:00.000Z",
-  "notOnOrAfter": "2120-01-01T00:00:00.000Z",
-  "renewable": false,
-  "delegable": false,
-  "solution": false,
-  "fullName": {
-    "first": "",
-    "last": ""
-  },
-  "groups": [],
-  "delegation": [],
-  "audience": [],
-  "advice": [],
-  "certificate": null
-}
-)";
-
-constexpr const char *FULL_JSON = R"({
-  "schema": 1,
-  "verified": @VERIFIED@,
-  "id": "_a18b869b-2e81-c0c5-2955-2a3c4fa5c92e",
-  "subject": {
-    "name": "alice",
-    "domain": "corp.example"
-  },
-  "confirmation": "holder-of-key",
-  "notBefore": "2020-01-01T00:00:00.000Z",
-  "notOnOrAfter": "2120-01-01T00:00:00.000Z",
-  "renewable": true,
-  "delegable": true,
-  "solution": true,
-  "fullName": {
-    "first": "Alice",
-    "last": "Liddell"
-  },
-  "groups": [
-    {
-      "name": "Administrators",
-      "domain": "corp.example"
-    },
-    {
-      "name": "Users",
-      "domain": "corp.example"
-    },
-    {
-      "name": "Ops\\Night Shift",
-      "domain": "corp.example"
-    }
-  ],
-  "delegation": [
-    {
-      "name": "gateway",
-      "domain": "corp.example",
-      "instant": "2020-01-01T00:00:01.250Z"
-    },
-    {
-      "name": "backup",
-      "domain": "corp.example",
-      "instant": "2020-01-01T00:00:02.000Z"
-    }
-  ],
-  "audience": [
-    "https://files.corp.example/",
-    "https://mail.corp.example/"
-  ],
-  "advice": [
-    {
-      "source": "urn:corp.example:mapper",
-      "attributes": [
-        {
-          "name": "urn:corp.example:advice:color",
-          "values": [
-            "green",
-            "blue"
-          ]
-        },
-        {
-          "name": "urn:corp.example:advice:empty",
-          "values": []
-        }
-      ]
-    },
-    {
-      "source": "urn:corp.example:audit",
-      "attributes": []
-    }
-  ],
-  "certificate": {
-    "subject": "CN=holder,O=Example",
-    "sha256": "@HOLDER_SHA256@"
-  }
-}
-)";
-
-std::string Json(std::string text, bool verified) {
-  const std::string mark = "@VERIFIED@";
-  return text.replace(text.find(mark), mark.size(), verified ? "true" : "false");
+std::string ExpectedJson(const std::string &file, bool verified) {
+  return Fill(Expected(file), "@VERIFIED@", verified ? "true" : "false");
 }
 
-/// A file of its own that is gone at the end.
+/// A file that is deleted at the end.
 class TemporaryFile {
 public:
   explicit TemporaryFile(const std::string &content)
@@ -186,20 +59,20 @@ private:
 
 TEST(Verify, ShowsAVerifiedTokenAsText) {
   ExpectResult(RunTool({"verify", "--trust", "sts-rsa.crt", "full.xml"}), 0,
-               "Verified:        yes\n" + WithHolder(FULL_TEXT), "");
+               "Verified:        yes\n" + Expected("full.txt"), "");
 }
 
 TEST(Verify, ShowsAVerifiedTokenAsJson) {
   ExpectResult(RunTool({"verify", "--format", "json", "--trust", "sts-rsa.crt", "full.xml"}), 0,
-               Json(WithHolder(FULL_JSON), true), "");
+               ExpectedJson("full.json", true), "");
 }
 
 TEST(Verify, ShowsATokenWithoutOptionalPartsAsJson) {
   ExpectResult(RunTool({"verify", "--format", "json", "--trust", "sts-rsa.crt", "bearer-minimal.xml"}), 0,
-               Json(MINIMAL_JSON, true), "");
+               ExpectedJson("minimal.json", true), "");
 }
 
-TEST(Verify, GivesTheTokenItselfAsXml) {
+TEST(Verify, PrintsTheTokenItselfAsXml) {
   ExpectResult(RunTool({"verify", "--format", "xml", "--trust", "sts-rsa.crt", "style-pretty.xml"}), 0,
                ReadDataFile("tokens/style-pretty.xml"), "");
 }
@@ -207,10 +80,10 @@ TEST(Verify, GivesTheTokenItselfAsXml) {
 TEST(Verify, ReadsStandardInputForADash) {
   ExpectResult(
       RunTool({"verify", "--format", "json", "--trust", "sts-rsa.crt", "-"}, ReadDataFile("tokens/bearer-minimal.xml")),
-      0, Json(MINIMAL_JSON, true), "");
+      0, ExpectedJson("minimal.json", true), "");
 }
 
-TEST(Verify, TakesTheKeysOfAllTrustFiles) {
+TEST(Verify, TrustsTheKeysOfAllTrustFiles) {
   EXPECT_EQ(
       0, RunTool({"verify", "--trust", "sts-rsa.crt", "--trust", "sts-ec256.crt", "ecdsa-p256-sha256.xml"}).exitCode);
   EXPECT_EQ(0, RunTool({"verify", "--trust", "sts-bundle.pem", "signed-by-second.xml"}).exitCode);
@@ -230,14 +103,14 @@ TEST(Verify, WarnsOfATrustedCertificateThatIsOutOfDateAndTrustsItsKey) {
 TEST(Verify, WarnsInJsonOnlyWhenAskedTo) {
   const std::vector<std::string> line = {
       "verify", "--format", "json", "--trust", "sts-rsa-expired.crt", "bearer-minimal.xml"};
-  ExpectResult(RunTool(line), 0, Json(MINIMAL_JSON, true), "");
+  ExpectResult(RunTool(line), 0, ExpectedJson("minimal.json", true), "");
   std::vector<std::string> verbose = line;
   verbose.push_back("-v");
-  ExpectResult(RunTool(verbose), 0, Json(MINIMAL_JSON, true), EXPIRED_WARNING);
+  ExpectResult(RunTool(verbose), 0, ExpectedJson("minimal.json", true), EXPIRED_WARNING);
 }
 
-TEST(Verify, TakesTheTolerance) {
-  // 2021-01-01 is not 200 years ago for a long time to come.
+TEST(Verify, AppliesTheTolerance) {
+  // The token expired on 2021-01-01; the tolerance is 200 years.
   EXPECT_EQ(0, RunTool({"verify", "--tolerance", "6307200000", "--trust", "sts-rsa.crt", "expired.xml"}).exitCode);
   EXPECT_EQ(5, RunTool({"verify", "--tolerance", "-6307200000", "--trust", "sts-rsa.crt", "bearer.xml"}).exitCode);
 }
@@ -248,7 +121,7 @@ struct Refusal {
   int exitCode;
   const char *exceptionClass;
   const char *label;
-  const char *message; ///< as in text; it holds nothing that JSON escapes
+  const char *message; ///< as in text; contains nothing that JSON escapes
 };
 
 const Refusal REFUSALS[] = {
@@ -350,12 +223,13 @@ INSTANTIATE_TEST_SUITE_P(Of, VerifyRefusal, testing::ValuesIn(REFUSALS),
 
 TEST(Inspect, ShowsATokenAsTextAndSaysThatNothingWasChecked) {
   ExpectResult(RunTool({"inspect", "full.xml"}), 0,
-               "Verified:        no, nothing below was checked\n" + WithHolder(FULL_TEXT), "");
+               "Verified:        no, nothing below was checked\n" + Expected("full.txt"), "");
 }
 
 TEST(Inspect, NeverClaimsToVerify) {
-  ExpectResult(RunTool({"inspect", "--format", "json", "full.xml"}), 0, Json(WithHolder(FULL_JSON), false), "");
-  ExpectResult(RunTool({"inspect", "--format", "json", "bearer-minimal.xml"}), 0, Json(MINIMAL_JSON, false), "");
+  ExpectResult(RunTool({"inspect", "--format", "json", "full.xml"}), 0, ExpectedJson("full.json", false), "");
+  ExpectResult(RunTool({"inspect", "--format", "json", "bearer-minimal.xml"}), 0, ExpectedJson("minimal.json", false),
+               "");
 }
 
 TEST(Inspect, ShowsTokensThatWouldBeRefusedForDatesOrSignature) {
@@ -366,21 +240,21 @@ TEST(Inspect, ShowsTokensThatWouldBeRefusedForDatesOrSignature) {
   }
 }
 
-TEST(Inspect, RefusesWhatIsNotOfTheFormOfAToken) {
+TEST(Inspect, RefusesADocumentThatIsNotAToken) {
   ExpectResult(RunTool({"inspect", "../attacks/split-comment.xml"}), 5, "",
                "ssoclient: token invalid: Element 'saml:NameID' must only have textual content (but has extra children "
                "or is empty).\n");
 }
 
-TEST(Inspect, ReadsStandardInputAndGivesXmlAsItCame) {
+TEST(Inspect, ReadsStandardInputAndPrintsXmlUnchanged) {
   const std::string token = ReadDataFile("tokens/style-pretty.xml");
   ExpectResult(RunTool({"inspect", "--format", "xml", "-"}, token), 0, token, "");
 }
 
-TEST(Inspect, ShowsControlCharactersInsteadOfObeyingThem) {
+TEST(Inspect, EscapesControlCharacters) {
   std::string token = ReadDataFile("tokens/bearer-minimal.xml");
   const std::string alice = ">alice@";
-  // A line feed that would feign a line, the C1 control that starts terminal sequences, and a turn of direction.
+  // A line feed that would fake a line, the C1 control that starts terminal sequences, and a change of direction.
   token.replace(token.find(alice), alice.size(), ">a\nVerified: yes\xC2\x9B\xE2\x80\xAE\xF0\x9F\x99\x82\xC3\xA9@");
   const TemporaryFile file(token);
   const Result text = RunTool({"inspect", file.Path()});
@@ -393,8 +267,8 @@ TEST(Inspect, ShowsControlCharactersInsteadOfObeyingThem) {
       << json.out;
 }
 
-TEST(Tool, ShowsControlCharactersBehindOctetsThatAreNoUtf8) {
-  // Each lead octet announces more than follows, and must not take the escape character for a part of it.
+TEST(Tool, EscapesControlCharactersAfterOctetsThatAreNotUtf8) {
+  // Each lead octet announces more octets than follow. The escape character must not count as one of them.
   const std::string name = "missing\xC3\x1B[2J\xE2\x80\x1B[2J\xF0\x1B[2J\xF0\x9F\x1B";
   ExpectResult(RunTool({"inspect", name}), 7, "",
                "ssoclient: file: missing\xC3\\u001B[2J\xE2\\u0080\\u001B[2J\xF0\\u001B[2J\xF0\\u009F\\u001B: "
@@ -402,7 +276,7 @@ TEST(Tool, ShowsControlCharactersBehindOctetsThatAreNoUtf8) {
 }
 
 TEST(Tool, RefusesADocumentBeyondTheLimitWithoutReadingItAll) {
-  // Twice the limit; what is beyond it is not read, and the feeding end may break.
+  // Twice the limit. The tool does not read all of it, so that writing the rest may fail.
   const Result result = RunTool({"inspect", "-"}, "<x>" + std::string(32u * 1024 * 1024, 'a'));
   EXPECT_EQ(5, result.exitCode);
   EXPECT_EQ("", result.out);
@@ -421,18 +295,18 @@ TEST(Tool, EndsWith130WhenInterrupted) {
 
 TEST(Tool, LeavesAnIgnoredInterruptIgnored) {
   ExpectResult(RunShell("trap '' INT; ssoclient inspect --format json bearer-minimal.xml & wait $!"), 0,
-               Json(MINIMAL_JSON, false), "");
+               ExpectedJson("minimal.json", false), "");
 }
 
-TEST(Tool, SaysItsVersion) {
+TEST(Tool, PrintsItsVersion) {
   ExpectResult(RunTool({"--version"}), 0, "ssoclient " SSOCLIENT_VERSION "\n", "");
 }
 
-TEST(Tool, WantsACommand) {
+TEST(Tool, RequiresACommand) {
   ExpectResult(RunTool({}), 2, "", "ssoclient: usage: A subcommand is required; see ssoclient --help\n");
 }
 
-TEST(Tool, NamesAnUnknownCommandOrOption) {
+TEST(Tool, ReportsAnUnknownCommandOrOption) {
   ExpectResult(RunTool({"bogus", "token.xml"}), 2, "",
                "ssoclient: usage: unknown command or option 'bogus'; see ssoclient --help\n");
   ExpectResult(RunTool({"--bogus"}), 2, "",
@@ -465,7 +339,7 @@ TEST(Tool, ListsItsCommandsAndExitCodesInTheHelp) {
 )"));
 }
 
-// A line of a terminal, and a value of 15 MiB: text for people is cut, JSON for programs is whole.
+// A value of 15 MiB is cut in text, which people read, and whole in JSON, which programs read.
 
 const std::string LONG_VALUE(15u * 1024 * 1024, 'x');
 
@@ -487,7 +361,7 @@ TEST(LongValues, AreCutInALineAboutAFailureAndWholeInItsJson) {
   EXPECT_NE(std::string::npos, json.err.find(LONG_VALUE));
 }
 
-TEST(LongValues, AreCutAfterTheyWereEscaped) {
+TEST(LongValues, AreCutAfterTheyHaveBeenEscaped) {
   std::string token = ReadDataFile("tokens/bearer.xml");
   const std::string method = "urn:oasis:names:tc:SAML:2.0:cm:bearer";
   std::string tabs;

@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
-// What the tool says when the service issues a token, but not the one that was asked for, and what it says of requests that
-// services are known to refuse.
+// What the tool reports when the issued token is not what was asked for, and about requests that services are known to
+// refuse.
 
 #include "expect_result.h"
 #include "service_test.h"
@@ -35,7 +35,7 @@ std::string Warning(const std::string &wanted) {
   return "ssoclient: warning: asked for, but not given by the service: " + wanted + "\n";
 }
 
-TEST_F(UnmetRequest, IsOneWarningForEachThingThatTheTokenDoesNotHave) {
+TEST_F(UnmetRequest, IsOneWarningForEachPropertyThatTheTokenDoesNotHave) {
   const Result result = Run("ssoclient acquire " + Service("plain-token") + PASSWORD + EVERYTHING + "--out token.xml");
   EXPECT_EQ(0, result.exitCode);
   EXPECT_THAT(result.out, StartsWith("Verified:        yes\n"));
@@ -45,7 +45,7 @@ TEST_F(UnmetRequest, IsOneWarningForEachThingThatTheTokenDoesNotHave) {
             result.err);
 }
 
-TEST_F(UnmetRequest, IsWarnedOfAlsoWhenStandardOutputGetsTheTokenItself) {
+TEST_F(UnmetRequest, IsAWarningEvenWhenStandardOutputGetsTheTokenItself) {
   for (const char *options : {"--format xml", "--out -", "--format xml --out token.xml"}) {
     const Result result = Run("ssoclient acquire " + Service("plain-token") + PASSWORD + "--renewable " + options);
     EXPECT_EQ(0, result.exitCode);
@@ -53,7 +53,7 @@ TEST_F(UnmetRequest, IsWarnedOfAlsoWhenStandardOutputGetsTheTokenItself) {
   }
 }
 
-TEST_F(UnmetRequest, IsListedInJsonAndWarnedOfThereToo) {
+TEST_F(UnmetRequest, IsListedInJsonAndIsAlsoAWarningThere) {
   const std::string line =
       "ssoclient acquire --format json " + Service("plain-token") + PASSWORD + EVERYTHING + "--lifetime 1h ";
   const Result result = Run(line);
@@ -76,7 +76,7 @@ TEST_F(UnmetRequest, IsAShorterLifetimeThanWasAskedFor) {
   EXPECT_THAT(json.out, EndsWith("\"unmet\": [\n    \"lifetime\"\n  ]\n}\n"));
 }
 
-TEST_F(UnmetRequest, IsTheAudienceOfSomebodyElse) {
+TEST_F(UnmetRequest, IsAnotherAudienceThanWasAskedFor) {
   const Result result = Run("ssoclient acquire " + Service("wrong-audience") + PASSWORD +
                             "--audience https://mail.corp.example/ --audience https://a.corp.example/");
   EXPECT_EQ(0, result.exitCode);
@@ -89,7 +89,7 @@ TEST_F(UnmetRequest, IsNotWhatWasNotAskedFor) {
   ExpectResult(Run("ssoclient acquire " + Service("plain-token") + PASSWORD + "--format xml >token.xml"), 0, "", "");
 }
 
-TEST_F(UnmetRequest, OfARenewalIsTheLifetimeAlone) {
+TEST_F(UnmetRequest, OfARenewalIsOnlyTheLifetime) {
   Acquire("token.xml", std::string(IDENTITY) + "--renewable --delegable --audience https://mail.corp.example/");
   const std::string renew = "ssoclient renew --format json " + Service("plain-token") + IDENTITY;
   const Result whole = Run(renew + "token.xml");
@@ -101,7 +101,7 @@ TEST_F(UnmetRequest, OfARenewalIsTheLifetimeAlone) {
   EXPECT_EQ(Warning("a lifetime of 1200 seconds; the token ends at " + EndOf("renewed.xml")), shorter.err);
 }
 
-TEST_F(UnmetRequest, IsNoKeyOfATokenThatNobodyAskedFor) {
+TEST_F(UnmetRequest, IsNotAKeyWhenTheCommandDoesNotAcquireAToken) {
   Acquire("token.xml", PASSWORD);
   for (const char *command : {"verify --trust sts.pem", "inspect"}) {
     const Result result = Run(std::string("ssoclient ") + command + " --format json token.xml");
@@ -110,24 +110,24 @@ TEST_F(UnmetRequest, IsNoKeyOfATokenThatNobodyAskedFor) {
   }
 }
 
-TEST_F(UnmetRequest, ShowsNothingThatSteersTheTerminal) {
+TEST_F(UnmetRequest, ShowsNothingThatControlsTheTerminal) {
   const Result result = Run("ssoclient acquire " + Service("plain-token") + PASSWORD + "--audience 'a\xE2\x80\xAE'");
   EXPECT_EQ(Warning("restriction to the audience a\\u202E; the token is not restricted"), result.err);
 }
 
 class DoubtfulRequest : public ServiceTest {};
 
-constexpr const char *DELEGATION_WARNING = "ssoclient: warning: with --delegate-to, a token is asked for that is bound "
-                                           "to the identity's key, but without proof "
-                                           "of the key, which services refuse\n";
+constexpr const char *DELEGATION_WARNING = "ssoclient: warning: with --delegate-to, the request asks for a token that "
+                                           "is bound to the identity's key, but does not prove the key; services "
+                                           "refuse that\n";
 constexpr const char *DELEGATION_HINT =
-    "give --bearer, too: with --user or --gss, a token for --delegate-to cannot be bound to a key";
+    "also give --bearer: with --user or --gss, a token for --delegate-to cannot be bound to a key";
 constexpr const char *EXCHANGE_WARNING =
-    "ssoclient: warning: the token to exchange is a bearer token, whose exchange services refuse\n";
+    "ssoclient: warning: the token to exchange is a bearer token; services refuse to exchange those\n";
 constexpr const char *EXCHANGE_HINT =
     "an exchange needs a holder-of-key token; acquire one with the identity, and without --bearer";
 
-TEST_F(DoubtfulRequest, ForADelegatedTokenBesideAnIdentityIsSentWithAWarningAndRefusedWithAHint) {
+TEST_F(DoubtfulRequest, ForADelegatedTokenWithAnIdentityIsSentWithAWarningAndRefusedWithAHint) {
   const std::string line =
       "ssoclient acquire " + Service() + PASSWORD + IDENTITY + "--delegate-to bob@corp.example --out token.xml ";
   ExpectResult(Run(line), 8, "",
@@ -135,7 +135,7 @@ TEST_F(DoubtfulRequest, ForADelegatedTokenBesideAnIdentityIsSentWithAWarningAndR
                    "ssoclient: service fault: Unexpected SOAP fault: wst:InvalidRequest; request failed.\n"
                    "ssoclient: hint: " +
                    DELEGATION_HINT + "\n");
-  EXPECT_THAT(m_service.GetLog(), HasSubstr("a holder-of-key token is asked for without proof of a key"));
+  EXPECT_THAT(m_service.GetLog(), HasSubstr("the request asks for a holder-of-key token without proof of a key"));
   ExpectResult(Run(line + "--format json"), 8, "",
                R"({"schema":1,"error":{"class":"SsoException","message":)"
                R"("Unexpected SOAP fault: wst:InvalidRequest; request failed.","hint":")" +
@@ -161,7 +161,7 @@ TEST_F(DoubtfulRequest, OfABearerTokensExchangeIsSentWithAWarningAndRefusedWithA
                    std::string(EXCHANGE_HINT) + "\"}}\n");
 }
 
-TEST_F(DoubtfulRequest, ThatIsTakenForOneOfWrongCredentialsIsRefusedWithAHint) {
+TEST_F(DoubtfulRequest, ThatIsRefusedForWrongCredentialsHasAHint) {
   ExpectResult(Run("ssoclient acquire " + Service("soap-fault-FailedAuthentication") + PASSWORD + IDENTITY +
                    "--bearer --delegate-to bob@corp.example"),
                3, "", "ssoclient: credentials refused: Authentication failed: a fault was asked for\n");
@@ -182,7 +182,7 @@ TEST_F(DoubtfulRequest, HasNoHintWhenItFailsForAnotherReason) {
                    "ssoclient: communication failed: Server returned error: 404 Not Found\n");
 }
 
-TEST_F(DoubtfulRequest, IsNotOneThatTheServiceGrants) {
+TEST_F(DoubtfulRequest, IsNotARequestThatTheServiceGrants) {
   Acquire("client.xml", std::string(IDENTITY) + "--delegable");
   const std::string delegate = "--delegate-to bob@corp.example --format xml >token.xml";
   ExpectResult(Run("ssoclient acquire " + Service() + PASSWORD + delegate), 0, "", "");

@@ -27,7 +27,7 @@ using Testing::TlsSettings;
 
 /// Answers with the Host header of the request.
 void TellHost(ServerConnection &connection) {
-  if (connection.ShakeHands()) {
+  if (connection.Handshake()) {
     const std::string request = connection.ReadRequest();
     const std::size_t start = request.find("\r\nHost: ") + 8;
     connection.Write(Response("200 OK", request.substr(start, request.find('\r', start) - start)));

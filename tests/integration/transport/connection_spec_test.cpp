@@ -87,7 +87,7 @@ TEST(SsoConnectionSpec, ConnectsAndHandsTheStreamOut) {
   ScriptedServer plain([](ServerConnection &connection) { connection.Stall(); });
   ScriptedServer tls(
       [](ServerConnection &connection) {
-        connection.ShakeHands();
+        connection.Handshake();
         connection.Stall();
       },
       TlsSettings());
@@ -118,7 +118,7 @@ TEST(SsoConnectionSpec, PassesStreamAndFailureOnWhenTheConnectFails) {
 TEST(SsoConnectionSpec, PassesTheTlsStreamOnWhenTheHandshakeFails) {
   TlsSettings settings;
   settings.certificate = "expired";
-  ScriptedServer server([](ServerConnection &connection) { connection.ShakeHands(); }, settings);
+  ScriptedServer server([](ServerConnection &connection) { connection.Handshake(); }, settings);
   const Connected connected = Connect(Tls("localhost", server.GetPort(), CreateTrustingContext()));
   EXPECT_EQ(connected.failure, "The TLS handshake with localhost failed: the server's certificate was not accepted: "
                                "certificate has expired (certificate \"CN=expired\")");

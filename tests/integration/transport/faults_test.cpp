@@ -75,7 +75,7 @@ ScriptedServer::Script Send(const std::string &bytes) {
 /// The same, and ends the connection with a reset.
 ScriptedServer::Script SendAndReset(const std::string &bytes) {
   return [bytes](ServerConnection &connection) {
-    connection.ShakeHands();
+    connection.Handshake();
     connection.ReadRequest();
     connection.Write(bytes);
     connection.Reset();
@@ -85,7 +85,7 @@ ScriptedServer::Script SendAndReset(const std::string &bytes) {
 /// The same, and leaves the connection open.
 ScriptedServer::Script SendAndStall(const std::string &bytes) {
   return [bytes](ServerConnection &connection) {
-    connection.ShakeHands();
+    connection.Handshake();
     connection.ReadRequest();
     connection.Write(bytes);
     connection.Stall();
@@ -95,7 +95,7 @@ ScriptedServer::Script SendAndStall(const std::string &bytes) {
 /// Sends the same again and again until the client has had enough.
 ScriptedServer::Script SendWithoutEnd(const std::string &start, const std::string &repeated) {
   return [start, repeated](ServerConnection &connection) {
-    connection.ShakeHands();
+    connection.Handshake();
     connection.ReadRequest();
     connection.Write(start);
     while (connection.Write(repeated)) {
@@ -183,7 +183,7 @@ INSTANTIATE_TEST_SUITE_P(Misbehaviour, TransportOverTls, testing::ValuesIn(MISBE
 
 ScriptedServer::Script SendAndEndWithoutNotice(const std::string &bytes) {
   return [bytes](ServerConnection &connection) {
-    connection.ShakeHands();
+    connection.Handshake();
     connection.ReadRequest();
     connection.Write(bytes);
     connection.CloseWithoutNotice();
@@ -220,7 +220,7 @@ INSTANTIATE_TEST_SUITE_P(
 
 TEST(TransportBytesAfterTheEnd, AreIgnoredHoweverTheyArePacked) {
   const auto inTwoPieces = [](ServerConnection &connection) {
-    connection.ShakeHands();
+    connection.Handshake();
     connection.ReadRequest();
     connection.Write(LENGTH_5 + "hello");
     connection.Write(", world");
@@ -280,7 +280,7 @@ std::string AskRefusedAndThenRepairedServer(const TlsSettings &settings, const s
                                             const TlsSettings &repaired = {}) {
   const auto receivedRequest = std::make_shared<std::atomic<bool>>(false);
   ServiceStandIn service(FaultThenAnswer([receivedRequest](ServerConnection &connection) {
-                           *receivedRequest = connection.ShakeHands() && !connection.ReadSome().empty();
+                           *receivedRequest = connection.Handshake() && !connection.ReadSome().empty();
                          }),
                          settings, Testing::NO_TIMEOUT, "localhost", parameter);
   const auto session = service.CreateSession();
@@ -357,7 +357,7 @@ TEST(TransportResumption, MakesTheSecondRequestsHandshakeAnAbbreviatedOne) {
     settings.minimumVersion = settings.maximumVersion = version;
     ServiceStandIn service(
         [](ServerConnection &connection) {
-          if (connection.ShakeHands()) {
+          if (connection.Handshake()) {
             connection.ReadRequest();
             connection.Write(Testing::Response("200 OK", connection.WasResumed() ? "resumed" : "full"));
           }

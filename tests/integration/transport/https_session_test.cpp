@@ -92,7 +92,7 @@ TEST(HttpsSession, PostsAndReadsLargeMessagesOverTls) {
   const std::string large(3 * 1024 * 1024, 'x');
   ServiceStandIn service(
       [&](ServerConnection &connection) {
-        connection.ShakeHands();
+        connection.Handshake();
         const std::string request = connection.ReadRequest();
         connection.Write(Response("200 OK", request.substr(request.find("\r\n\r\n") + 4)));
       },
@@ -278,7 +278,7 @@ public:
   explicit CookieService(std::vector<std::string> setCookies, bool tls = false)
       : m_service(
             [this, setCookies](ServerConnection &connection) {
-              if (connection.ShakeHands()) {
+              if (connection.Handshake()) {
                 Note(connection.ReadRequest());
                 std::string fields;
                 for (const std::string &cookie : setCookies) {

@@ -32,7 +32,7 @@ inline std::string Response(const std::string &status, const std::string &body, 
 /// A script that reads the request and answers it with these bytes.
 inline ScriptedServer::Script AnswerWith(std::string bytes) {
   return [bytes = std::move(bytes)](ServerConnection &connection) {
-    if (connection.ShakeHands()) {
+    if (connection.Handshake()) {
       connection.ReadRequest();
       connection.Write(bytes);
     }

@@ -49,7 +49,7 @@ const std::string START = "HTTP/1.1 200 OK\r\nContent-Length: 500000\r\n\r\n";
 
 ScriptedServer::Script StallAfter(const std::string &bytes) {
   return [bytes](ServerConnection &connection) {
-    connection.ShakeHands();
+    connection.Handshake();
     connection.ReadRequest();
     connection.Write(bytes);
     connection.Stall();
@@ -59,7 +59,7 @@ ScriptedServer::Script StallAfter(const std::string &bytes) {
 /// A byte at a time, each well within the time-out.
 ScriptedServer::Script Drip(const std::string &bytes) {
   return [bytes](ServerConnection &connection) {
-    connection.ShakeHands();
+    connection.Handshake();
     connection.ReadRequest();
     for (const char c : bytes) {
       if (!connection.Write({&c, 1})) {
@@ -103,7 +103,7 @@ INSTANTIATE_TEST_SUITE_P(Delays, TransportTimeout,
                                                [](ServerConnection &connection) { connection.WaitForInterrupt(); }},
                                          Delay{"StallBeforeTheRequestIsReadOverTls", true,
                                                [](ServerConnection &connection) {
-                                                 connection.ShakeHands();
+                                                 connection.Handshake();
                                                  connection.WaitForInterrupt();
                                                }},
                                          Delay{"StallBeforeTheHeader", false, StallAfter("")},

@@ -33,7 +33,7 @@ TEST(RsaAdviceSetBuilder, ListsAdvicesAttributesAndValuesInTheirOrder) {
                 "</rsa-advice:Advice></rsa-advice:AdviceSet>");
 }
 
-TEST(RsaAdviceSetBuilder, OfAnEmptyListIsAnEmptySetThatDeclaresItsPrefixes) {
+TEST(RsaAdviceSetBuilder, MakesAnEmptySetThatDeclaresItsPrefixesFromAnEmptyList) {
   EXPECT_EQ(SerializeToXML(RsaAdviceSetBuilder({})), ADVICE_SET + "</rsa-advice:AdviceSet>");
 }
 
@@ -42,7 +42,7 @@ TEST(RsaAttributeBuilder, LeavesMarkupToTheSerialiser) {
             Attribute("n&lt;&quot;&amp;", Value("v&lt;&amp;")));
 }
 
-TEST(RsaAttributeBuilder, WithoutValuesIsEmpty) {
+TEST(RsaAttributeBuilder, MakesAnEmptyElementWithoutValues) {
   EXPECT_EQ(SerializeToXML(RsaAttributeBuilder({"n", {}})), Attribute("n", ""));
 }
 

@@ -106,20 +106,20 @@ TEST_F(SignSoapMessageTest, SignsWithExclusiveCanonicalisationAndSha256) {
             "http://www.w3.org/2001/04/xmlenc#sha256");
 }
 
-TEST_F(SignSoapMessageTest, PutsTheReferenceToTheTokenIntoTheKeyInfo) {
+TEST_F(SignSoapMessageTest, WritesTheReferenceToTheTokenIntoTheKeyInfo) {
   const ElementRef envelope = Sign(WsSecurityHeaderBuilder(10), WsseX509v3BSTReferenceBuilder("theId"));
   const ElementNode *const keyInfo = Child(LastChild(Security(envelope)), DS_URI, "KeyInfo");
   const ElementNode *const reference = Child(keyInfo, WSSE_URI, "SecurityTokenReference");
   EXPECT_EQ(Attribute(Child(reference, WSSE_URI, "Reference"), "", "URI"), "#theId");
 }
 
-TEST_F(SignSoapMessageTest, SignsTheBodyAloneWhenThereIsNoTimestamp) {
+TEST_F(SignSoapMessageTest, SignsOnlyTheBodyWhenThereIsNoTimestamp) {
   const ElementRef envelope = Sign(ElementBuilder("wsse", "Security", {{"xmlns:wsse", WSSE_URI}}));
   EXPECT_EQ(ReferenceUris(LastChild(Security(envelope))),
             std::vector<std::string>{"#Body00000000-0000-4000-8000-000000000001"});
 }
 
-TEST_F(SignSoapMessageTest, KeepsAndReferencesAnIdentifierThatIsThereAlready) {
+TEST_F(SignSoapMessageTest, KeepsAndReferencesAnExistingIdentifier) {
   ElementRef envelope;
   SoapBuilder(WsSecurityHeaderBuilder(10), nullptr)->build(envelope);
   ElementNode *const body = envelope->FindChildElement(QName(SOAPENV_URI, "Body"));
@@ -131,7 +131,7 @@ TEST_F(SignSoapMessageTest, KeepsAndReferencesAnIdentifierThatIsThereAlready) {
             (std::vector<std::string>{"#mine", "#Timestamp00000000-0000-4000-8000-000000000001"}));
 }
 
-TEST_F(SignSoapMessageTest, TakesNoElementOfAnotherNamespaceForTheOneThatItSigns) {
+TEST_F(SignSoapMessageTest, IgnoresElementsOfOtherNamespaces) {
   const XMLAttributes decoys = {{"xmlns:d", "urn:decoys"}};
   const auto security =
       std::make_shared<XMLCompositeBuilder>(ElementBuilder("wsse", "Security", {{"xmlns:wsse", WSSE_URI}}));
@@ -166,14 +166,14 @@ TEST_F(SignSoapMessageTest, RefusesAMessageWithoutTheElementsThatASignatureNeeds
                         "Invalid argument : the message to sign has no element 'Header' in 'soapenv:Envelope'");
 }
 
-TEST_F(SignSoapMessageTest, PassesOnThatAKeyCannotSign) {
+TEST_F(SignSoapMessageTest, PassesOnTheExceptionOfAKeyThatCannotSign) {
   ElementRef envelope;
   SoapBuilder(WsSecurityHeaderBuilder(10), nullptr)->build(envelope);
   const auto key = Tarvel::Crypto::CreatePrivateKey(ReadDataFile("tokens/sts-ec256.key"));
   EXPECT_THROW(SignSoapMessage(*key, nullptr, envelope), Tarvel::Xml::Security::XmlSecurityException);
 }
 
-TEST_F(SignSoapMessageTest, LeavesASamlSignedHeaderUnchangedButForTheSignature) {
+TEST_F(SignSoapMessageTest, AddsOnlyTheSignatureToAHeaderWithASamlToken) {
   const XMLCompositePtr header = WsSecurityHeaderBuilder(10);
   header->Add(ElementBuilder("saml", "Assertion", {{"ID", "_a1"}, {"xmlns:saml", SAML_URI}}));
   const std::string before = SerializeToXML(header);
@@ -187,7 +187,7 @@ TEST_F(SignSoapMessageTest, LeavesASamlSignedHeaderUnchangedButForTheSignature) 
   EXPECT_EQ(after.substr(at + identified.size(), 13), "<ds:Signature");
 }
 
-TEST(CreateWssuId, IsTheLocalNameWithAUuidRightBehind) {
+TEST(CreateWssuId, IsTheLocalNameFollowedByAUuid) {
   const FixedEnvironment environment;
   ElementRef element;
   ElementBuilder("p", "Thing")->build(element);
@@ -197,7 +197,7 @@ TEST(CreateWssuId, IsTheLocalNameWithAUuidRightBehind) {
             "<p:Thing" + Declare("wsu", WSU_URI) + " wsu:Id=\"Thing00000000-0000-4000-8000-000000000001\"></p:Thing>");
 }
 
-TEST(CreateWssuId, TakesNoIdOfAnotherNamespaceForIt) {
+TEST(CreateWssuId, IgnoresAnIdOfAnotherNamespace) {
   const FixedEnvironment environment;
   ElementRef element;
   ElementBuilder("p", "Thing", {{"Id", "mine"}, {"xmlns:q", "urn:q"}, {"q:Id", "theirs"}})->build(element);

@@ -14,7 +14,7 @@ using namespace Testing;
 const std::string ENVELOPE = "<soapenv:Envelope" + Declare("soapenv", SOAPENV_URI) + ">";
 const std::string BODY = "<soapenv:Body" + Declare("wst", WST_URI) + ">";
 
-TEST(SoapBuilder, WrapsHeaderAndBodyAndDeclaresWsTrustOnTheBodyTooWhenItsContentDoes) {
+TEST(SoapBuilder, WrapsHeaderAndBodyAndDeclaresWsTrustOnTheBodyEvenIfItsContentDoes) {
   EXPECT_EQ(SerializeToXML(SoapBuilder(ElementBuilder("h", "H"), ElementBuilder("wst", "B", {{"xmlns:wst", WST_URI}}))),
             ENVELOPE + "<soapenv:Header><h:H></h:H></soapenv:Header>" + BODY + "<wst:B" + Declare("wst", WST_URI) +
                 "></wst:B></soapenv:Body></soapenv:Envelope>");

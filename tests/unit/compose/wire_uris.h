@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// The URIs of the wire, spelt out once more: a test that took them from the code would not notice a change.
+/// The URIs in messages, written again here: a test that used those of the code would not notice a change.
 
 #pragma once
 
@@ -20,7 +20,7 @@ const std::string XS_URI = "http://www.w3.org/2001/XMLSchema";
 const std::string XSI_URI = "http://www.w3.org/2001/XMLSchema-instance";
 const std::string RSA_ADVICE_URI = SSOCLIENT_EXTENSION_AUTHORITY "/names/2009/12/std-ext/WS-Trust1.4/advice";
 
-/// A namespace declaration as it stands in a start tag, with a blank before it.
+/// A namespace declaration as it is written in a start tag, with a blank before it.
 inline std::string Declare(const std::string &prefix, const std::string &uri) {
   return " xmlns:" + prefix + "=\"" + uri + "\"";
 }

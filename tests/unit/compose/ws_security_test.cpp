@@ -44,7 +44,7 @@ TEST(WssuTimestampBuilder, ReadsTheClockOnce) {
   EXPECT_EQ(now, FIXED_NOW + 1000000);
 }
 
-TEST(WsSecurityHeaderBuilder, HoldsTheTimestampAndTakesTokensBehindIt) {
+TEST(WsSecurityHeaderBuilder, ContainsTheTimestampFollowedByTokens) {
   const FixedEnvironment environment;
   const XMLCompositePtr header = WsSecurityHeaderBuilder(10);
   header->Add(ElementBuilder("wsse", "Token"));
@@ -52,13 +52,13 @@ TEST(WsSecurityHeaderBuilder, HoldsTheTimestampAndTakesTokensBehindIt) {
                                         "<wsse:Token></wsse:Token></wsse:Security>");
 }
 
-TEST(WsseUsernameTokenBuilder, WithoutPasswordHasTheUserNameAsOnlyChild) {
+TEST(WsseUsernameTokenBuilder, HasOnlyTheUserNameWithoutAPassword) {
   EXPECT_EQ(SerializeToXML(WsseUsernameTokenBuilder("alice")),
             "<wsse:UsernameToken" + Declare("wsse", WSSE_URI) +
                 "><wsse:Username>alice</wsse:Username></wsse:UsernameToken>");
 }
 
-TEST(WsseUsernameTokenBuilder, PutsThePasswordBehindTheUserName) {
+TEST(WsseUsernameTokenBuilder, WritesThePasswordAfterTheUserName) {
   EXPECT_EQ(SerializeToXML(WsseUsernameTokenBuilder("alice", "pa<ss")),
             "<wsse:UsernameToken" + Declare("wsse", WSSE_URI) +
                 "><wsse:Username>alice</wsse:Username><wsse:Password Type=\"http://docs.oasis-open.org/wss/2004/01/"
@@ -87,14 +87,14 @@ TEST(WsseX509v3BinarySecTokenBuilder, HoldsTheCertificateAsBase64WithoutDeclarin
                 Declare("wsu", WSU_URI) + ">" + base64 + "</wsse:BinarySecurityToken>");
 }
 
-TEST(WsseX509v3BSTReferenceBuilder, PutsTheFragmentUriBeforeTheValueType) {
+TEST(WsseX509v3BSTReferenceBuilder, WritesTheFragmentUriBeforeTheValueType) {
   EXPECT_EQ(SerializeToXML(WsseX509v3BSTReferenceBuilder("theId")),
             "<wsse:SecurityTokenReference" + Declare("wsse", WSSE_URI) +
                 "><wsse:Reference URI=\"#theId\" ValueType=\"http://docs.oasis-open.org/wss/2004/01/"
                 "oasis-200401-wss-x509-token-profile-1.0#X509v3\"></wsse:Reference></wsse:SecurityTokenReference>");
 }
 
-TEST(WsseSamlKeyIdReferenceBuilder, CarriesBothSpellingsOfTheSamlTokenProfile) {
+TEST(WsseSamlKeyIdReferenceBuilder, ContainsBothSpellingsOfTheSamlTokenProfile) {
   EXPECT_EQ(SerializeToXML(WsseSamlKeyIdReferenceBuilder("_a1")),
             "<wsse:SecurityTokenReference wsse11:TokenType=\"http://docs.oasis-open.org/wss/"
             "oasis-wss-saml-tokenprofile-1.1#SAMLV2.0\"" +
@@ -103,7 +103,7 @@ TEST(WsseSamlKeyIdReferenceBuilder, CarriesBothSpellingsOfTheSamlTokenProfile) {
                 "oasis-wss-saml-token-profile-1.1#SAMLID\">_a1</wsse:KeyIdentifier></wsse:SecurityTokenReference>");
 }
 
-TEST(InsertSamlTokenBuilder, YieldsTheAssertionAsItWasIssued) {
+TEST(InsertSamlTokenBuilder, ReturnsTheAssertionAsItWasIssued) {
   const std::string text = "<a:Assertion xmlns:a=\"urn:a\" ID=\"x\"  b=\"2\">\n  <!-- kept --><?kept too?>\n"
                            "\t<c xmlns=\"urn:c\">1 &lt; 2</c>\n</a:Assertion>";
   const TokenStandIn token("x", "<?xml version=\"1.0\"?>\n" + text, SamlToken::BEARER);
@@ -112,12 +112,12 @@ TEST(InsertSamlTokenBuilder, YieldsTheAssertionAsItWasIssued) {
             "\t<c xmlns=\"urn:c\">1 &lt; 2</c>\n</a:Assertion>");
 }
 
-TEST(InsertSamlTokenBuilder, PassesOnWhatTheParserSaysAboutATokenThatDoesNotParse) {
+TEST(InsertSamlTokenBuilder, PassesOnTheParsersExceptionForATokenThatDoesNotParse) {
   const TokenStandIn token("x", "<a:Assertion xmlns:a=\"urn:a\">", SamlToken::BEARER);
   EXPECT_THROW(InsertSamlTokenBuilder(token), Tarvel::Xml::XMLParseException);
 }
 
-TEST(InsertSamlTokenBuilder, FitsIntoOneTreeOnly) {
+TEST(InsertSamlTokenBuilder, CanBeBuiltIntoOneTreeOnly) {
   const TokenStandIn token("x", "<a:Assertion xmlns:a=\"urn:a\"/>", SamlToken::BEARER);
   const auto parent = std::make_shared<XMLCompositeBuilder>(ElementBuilder("p", "e"));
   parent->Add(InsertSamlTokenBuilder(token));

@@ -51,13 +51,13 @@ TEST(AcquireSecurityTokenBuilder, AsksForABearerTokenWithoutUseKey) {
   EXPECT_EQ(SerializeToXML(AcquireSecurityTokenBuilder(SamlToken::BEARER, TenMinutes())), BEARER_ISSUE + END);
 }
 
-TEST(AcquireSecurityTokenBuilder, EndsAHolderOfKeyRequestInUseKey) {
+TEST(AcquireSecurityTokenBuilder, EndsAHolderOfKeyRequestWithUseKey) {
   const FixedEnvironment environment;
   EXPECT_EQ(SerializeToXML(AcquireSecurityTokenBuilder(SamlToken::HOLDER_OF_KEY, TenMinutes())),
             PUBLIC_KEY_ISSUE + USE_KEY + END);
 }
 
-TEST(AcquireSecurityTokenBuilder, LeavesUseKeyOutForAConfirmationThatIsNeitherBearerNorHolderOfKey) {
+TEST(AcquireSecurityTokenBuilder, OmitsUseKeyForAConfirmationThatIsNeitherBearerNorHolderOfKey) {
   const FixedEnvironment environment;
   EXPECT_EQ(SerializeToXML(AcquireSecurityTokenBuilder(static_cast<SamlToken::ConfirmationType>(2), TenMinutes())),
             PUBLIC_KEY_ISSUE + END);
@@ -124,14 +124,14 @@ TEST(CommonAcquireSecurityTokenBuilder, AsksForAPublicKeyForEveryConfirmationBut
   EXPECT_EQ(SerializeToXML(CommonAcquireSecurityTokenBuilder(unknown, TenMinutes())), PUBLIC_KEY_ISSUE + END);
 }
 
-TEST(CommonAcquireSecurityTokenBuilder, StaysOpenForMoreChildren) {
+TEST(CommonAcquireSecurityTokenBuilder, AllowsFurtherChildren) {
   const FixedEnvironment environment;
   const XMLCompositePtr request = CommonAcquireSecurityTokenBuilder(SamlToken::BEARER, TenMinutes());
   request->Add(ElementBuilder("wst", "More"));
   EXPECT_EQ(SerializeToXML(request), BEARER_ISSUE + "<wst:More></wst:More>" + END);
 }
 
-TEST(ExchangeSecurityTokenBuilder, NeverCarriesUseKey) {
+TEST(ExchangeSecurityTokenBuilder, NeverHasUseKey) {
   const FixedEnvironment environment;
   EXPECT_EQ(SerializeToXML(ExchangeSecurityTokenBuilder(SamlToken::HOLDER_OF_KEY, TenMinutes())),
             PUBLIC_KEY_ISSUE + END);
@@ -170,7 +170,7 @@ TEST(WssuLifetimeBuilder, CountsLifetimesBeyondThirtyTwoBits) {
   EXPECT_EQ(SerializeToXML(WssuLifetimeBuilder(5000000000)), Lifetime("2184-06-12T11:57:25.006Z"));
 }
 
-TEST(WssuLifetimeBuilder, EndsAtTheLastMomentThereIsInsteadOfOverflowing) {
+TEST(WssuLifetimeBuilder, EndsAtTheLastRepresentableMomentInsteadOfOverflowing) {
   const FixedEnvironment environment;
   const std::int64_t longest = std::numeric_limits<std::int64_t>::max();
   for (const std::int64_t seconds : {longest, longest / 1000000, longest / 1000000 + 1}) {
@@ -185,7 +185,7 @@ TEST(WssuLifetimeBuilder, WritesNegativeLifetimesAsGiven) {
             Lifetime("0001-01-01T00:00:00.000Z"));
 }
 
-TEST(WstRenewingBuilder, AlwaysSaysThatRenewalAfterExpiryIsNotWanted) {
+TEST(WstRenewingBuilder, NeverRequestsRenewalAfterExpiry) {
   EXPECT_EQ(SerializeToXML(WstRenewingBuilder(true)), "<wst:Renewing Allow=\"true\" OK=\"false\"></wst:Renewing>");
   EXPECT_EQ(SerializeToXML(WstRenewingBuilder(false)), "<wst:Renewing Allow=\"false\" OK=\"false\"></wst:Renewing>");
 }

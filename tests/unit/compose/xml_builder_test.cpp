@@ -26,7 +26,7 @@ TEST(ElementBuilder, WritesAttributesInByteOrderOfTheirNames) {
   EXPECT_EQ(SerializeToXML(builder), "<p:e EncodingType=\"t\" ValueType=\"v\" wsu:Id=\"i\" xmlns:wsu=\"urn:u\"></p:e>");
 }
 
-TEST(ElementBuilder, KeepsTheFirstValueOfANameThatALiteralListRepeats) {
+TEST(ElementBuilder, UsesTheFirstValueOfANameThatAnInitialiserListRepeats) {
   EXPECT_EQ(SerializeToXML(ElementBuilder("p", "e", {{"A", "first"}, {"A", "second"}})), "<p:e A=\"first\"></p:e>");
 }
 
@@ -35,7 +35,7 @@ TEST(ElementBuilder, MakesANewElementAtEachBuild) {
   EXPECT_NE(Build(builder).get(), Build(builder).get());
 }
 
-TEST(ElementBuilder, ReplacesWhatTheOutReferenceHeld) {
+TEST(ElementBuilder, ReplacesTheValueOfTheOutReference) {
   ElementRef element = Build(ElementBuilder("p", "old"));
   ElementBuilder("p", "new")->build(element);
   EXPECT_EQ(element->GetName(), "p:new");
@@ -57,7 +57,7 @@ TEST(TextElementBuilder, StoresMarkupAsGivenAndLeavesEscapingToTheSerialiser) {
   EXPECT_EQ(SerializeToXML(builder), "<p:e a=\"&lt;&amp;&quot;\">a&lt;b &amp; c</p:e>");
 }
 
-TEST(XMLCompositeBuilder, WithoutChildrenBuildsExactlyTheBaseElement) {
+TEST(XMLCompositeBuilder, BuildsExactlyTheBaseElementWithoutChildren) {
   const auto composite = std::make_shared<XMLCompositeBuilder>(ElementBuilder("p", "e", {{"a", "1"}}));
   EXPECT_EQ(SerializeToXML(composite), "<p:e a=\"1\"></p:e>");
 }
@@ -76,7 +76,7 @@ TEST(XMLCompositeBuilder, IgnoresANullChildAndStillReturnsItself) {
   EXPECT_EQ(element->GetFirstChild(), nullptr);
 }
 
-TEST(XMLCompositeBuilder, AddsBehindTheChildrenThatItsBaseBrings) {
+TEST(XMLCompositeBuilder, AddsAfterTheChildrenOfItsBase) {
   const auto base = std::make_shared<XMLCompositeBuilder>(ElementBuilder("p", "e"));
   base->Add(ElementBuilder("p", "first"));
   const auto composite = std::make_shared<XMLCompositeBuilder>(base);
@@ -95,7 +95,7 @@ TEST(XMLCompositeBuilder, SharesOneChildBetweenTwoTrees) {
   EXPECT_EQ(SerializeToXML(two), "<p:two><p:c>t</p:c></p:two>");
 }
 
-TEST(PreBuiltElementImpl, HandsOutTheSameNodeAtEachBuild) {
+TEST(PreBuiltElementImpl, ReturnsTheSameNodeAtEachBuild) {
   const ElementRef element = Build(ElementBuilder("p", "e"));
   const XMLBuilderPtr builder = std::make_shared<const PreBuiltElementImpl>(element);
   EXPECT_EQ(Build(builder).get(), element.get());
@@ -129,14 +129,14 @@ TEST(SerializeToXML, WritesTextAndAttributeValuesInAscii) {
   EXPECT_EQ(SerializeToXML(builder), "<p:e a=\"&#xFC;&lt;\">&#x142;x&#x8A9E;&#x1F600;&amp;</p:e>");
 }
 
-TEST(SerializeToXML, LeavesWhatCannotBeAReferenceInAPreBuiltElementAsItIs) {
+TEST(SerializeToXML, KeepsInAPreBuiltElementWhatCannotBeAReference) {
   Tarvel::Ref<Tarvel::Xml::Document> document;
   ParseXML("<ü><!--ü-->ü</ü>", document);
   const Tarvel::Ref<Tarvel::Xml::ElementNode> root(document->GetDocumentElement());
   EXPECT_EQ(SerializeToXML(std::make_shared<const PreBuiltElementImpl>(root)), "<ü><!--ü-->&#xFC;</ü>");
 }
 
-/// Texts that an XML 1.0 document has no way to carry, escaped or not.
+/// Texts that an XML 1.0 document cannot contain, escaped or not.
 const std::string UNCARRIABLE[] = {
     std::string("a\0b", 3), "a\x01z",         "a\bz",   "a\x0bz", "a\x1fz",   "a\xef\xbf\xbez",
     "a\xef\xbf\xbfz",       "a\xed\xa0\x80z", "a\xffz", "a\xc3",  "\xc0\x80", "\xf4\x90\x80\x80"};

@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
-// Every request on the wire, byte for byte, against tests/data/requests. A change of the wire form shows as a difference of
-// these files; SSOCLIENT_UPDATE_GOLDEN=1 writes them anew, and then fails, so that nobody does so unseen.
+// Compares every request byte for byte with its file in tests/data/requests. A change of the wire format is a difference in
+// these files. With SSOCLIENT_UPDATE_GOLDEN=1 the test writes them again and then fails, so that this is never unnoticed.
 #include "support/data_file.h"
 #include "support/fixed_environment.h"
 #include "support/sample_requests.h"
@@ -19,13 +19,13 @@ using namespace Testing;
 
 class GoldenRequest : public testing::TestWithParam<SampleRequest> {};
 
-TEST_P(GoldenRequest, IsOnTheWireAsItsFileShowsIt) {
+TEST_P(GoldenRequest, IsByteForByteThatOfItsFile) {
   const FixedEnvironment environment;
   Request request;
   GetParam().build(request);
   const std::string file = std::string("requests/") + GetParam().name + ".xml";
   const std::string readable = ToReadable(request.body);
-  ASSERT_EQ(ToWire(readable), request.body) << "the readable form does not tell the whole message";
+  ASSERT_EQ(ToWire(readable), request.body) << "the readable form does not contain the whole message";
   if (std::getenv("SSOCLIENT_UPDATE_GOLDEN")) {
     std::ofstream(DataPath(file), std::ios::binary) << readable;
     FAIL() << "wrote " << file;

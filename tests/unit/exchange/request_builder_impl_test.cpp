@@ -66,7 +66,7 @@ protected:
   Request m_request;
 };
 
-TEST(ValidateLifetime, RefusesZeroAndLessAndPassesOne) {
+TEST(ValidateLifetime, RefusesZeroAndNegativeLifetimesAndAcceptsOne) {
   EXPECT_THROWS_MESSAGE(ValidateLifetime(0), Tarvel::InvalidArgumentException, LIFETIME_MESSAGE);
   EXPECT_THROWS_MESSAGE(ValidateLifetime(-1), Tarvel::InvalidArgumentException, LIFETIME_MESSAGE);
   EXPECT_THROWS_MESSAGE(ValidateLifetime(std::numeric_limits<std::int64_t>::min()), Tarvel::InvalidArgumentException,
@@ -85,7 +85,7 @@ TEST(RequestBuilderImplCreation, RefusesAnIdentityWithoutKeyOrCertificate) {
   }
 }
 
-TEST(ConfOverrideWithDelegate, IsNoneForADelegatedTokenAndElseWhatTheSpecSays) {
+TEST(ConfOverrideWithDelegate, IsNoneForADelegatedTokenAndOtherwiseThatOfTheSpec) {
   EXPECT_EQ(ConfOverrideWithDelegate(DelegatedSpec()), TokenSpec::CONFIRMATION_NONE);
   EXPECT_EQ(ConfOverrideWithDelegate(Spec()), TokenSpec::CONFIRMATION_DEFAULT);
   EXPECT_EQ(ConfOverrideWithDelegate(BearerSpec()), TokenSpec::CONFIRMATION_NONE);
@@ -114,11 +114,11 @@ TEST_F(RequestBuilderImplTest, EveryOperationWithALifetimeRefusesOneThatIsNotPos
   EXPECT_EQ(m_request.body, "");
 }
 
-TEST_F(RequestBuilderImplTest, ALifetimeOfOneSecondPasses) {
+TEST_F(RequestBuilderImplTest, ALifetimeOfOneSecondIsAccepted) {
   EXPECT_NO_THROW(m_plain.BuildUserPassTokenRequest("u", "p", Spec(1), m_request));
 }
 
-TEST_F(RequestBuilderImplTest, WithoutIdentityRequestsGoUnsignedAndAskForBearerTokens) {
+TEST_F(RequestBuilderImplTest, WithoutIdentityRequestsAreNotSignedAndAskForBearerTokens) {
   m_plain.BuildUserPassTokenRequest("u", "p", Spec(), m_request);
   EXPECT_TRUE(AsksForBearer(m_request) && !IsSigned(m_request)) << m_request.body;
   EXPECT_EQ(m_request.soapAction, Request::ISSUE);
@@ -162,12 +162,12 @@ TEST_F(RequestBuilderImplTest, WithIdentityAUserNameRequestIsSignedAndAsksForHol
   EXPECT_TRUE(IsSignedWithCertificate(m_request) && AsksForHolderOfKey(m_request)) << m_request.body;
 }
 
-TEST_F(RequestBuilderImplTest, WithIdentityABearerUserNameRequestGoesUnsigned) {
+TEST_F(RequestBuilderImplTest, WithIdentityABearerUserNameRequestIsNotSigned) {
   m_withIdentity.BuildUserPassTokenRequest("u", "p", BearerSpec(), m_request);
   EXPECT_TRUE(AsksForBearer(m_request) && !IsSigned(m_request)) << m_request.body;
 }
 
-TEST_F(RequestBuilderImplTest, WithIdentityABearerInitialSPNegoRequestGoesUnsigned) {
+TEST_F(RequestBuilderImplTest, WithIdentityABearerInitialSPNegoRequestIsNotSigned) {
   for (const int confirmation : {1, 7}) {
     TokenSpec spec = Spec();
     spec.confirmation = static_cast<TokenSpec::Confirmation>(confirmation);
@@ -177,7 +177,7 @@ TEST_F(RequestBuilderImplTest, WithIdentityABearerInitialSPNegoRequestGoesUnsign
   }
 }
 
-TEST_F(RequestBuilderImplTest, WithIdentityADelegatedRequestAsksForHolderOfKeyButGoesUnsigned) {
+TEST_F(RequestBuilderImplTest, WithIdentityADelegatedRequestAsksForHolderOfKeyButIsNotSigned) {
   m_withIdentity.BuildUserPassTokenRequest("u", "p", DelegatedSpec(), m_request);
   EXPECT_TRUE(AsksForHolderOfKey(m_request) && !IsSigned(m_request)) << m_request.body;
   m_withIdentity.BuildInitialSPNegoRequest(DelegatedSpec(), LEG, m_request);
@@ -220,7 +220,7 @@ TEST_F(RequestBuilderImplTest, ACertificateRequestRefusesAnotherConfirmation) {
                         "No HolderOfKeyConfig provided. Unable to acquire token by certificate");
 }
 
-TEST_F(RequestBuilderImplTest, AnExchangeIsSignedInTheNameOfThePresentedToken) {
+TEST_F(RequestBuilderImplTest, TheSignatureOfAnExchangeRefersToThePresentedToken) {
   for (const TokenSpec &spec : {Spec(), BearerSpec(), DelegatedSpec()}) {
     m_withIdentity.BuildExchangeTokenRequest(BEARER_TOKEN, spec, m_request);
     EXPECT_EQ(m_request.soapAction, Request::ISSUE);
@@ -244,7 +244,7 @@ TEST_F(RequestBuilderImplTest, RenewingABearerTokenFailsBeforeAnyXmlIsBuilt) {
   EXPECT_EQ(m_request.soapAction, "");
 }
 
-TEST_F(RequestBuilderImplTest, RenewingWithoutIdentityReportsTheIdentityNotTheToken) {
+TEST_F(RequestBuilderImplTest, RenewingWithoutIdentityReportsTheMissingIdentityBeforeTheToken) {
   EXPECT_THROWS_MESSAGE(m_plain.BuildRenewRequest(BEARER_TOKEN, 600, m_request), Tarvel::InvalidStateException,
                         "No HolderOfKeyConfig provided. Unable to renew token");
 }
@@ -255,7 +255,7 @@ TEST_F(RequestBuilderImplTest, AValidateRequestIsNotSignedEvenWithAnIdentity) {
   EXPECT_TRUE(Has(m_request, "<wst:ValidateTarget>" + TOKEN_XML + "</wst:ValidateTarget>")) << m_request.body;
 }
 
-TEST_F(RequestBuilderImplTest, AFailureWhileComposingLeavesTheBodyAsItWas) {
+TEST_F(RequestBuilderImplTest, AFailureWhileComposingDoesNotChangeTheBody) {
   m_request.body = "earlier";
   EXPECT_THROWS_MESSAGE(m_plain.BuildValidateSubjectRequest(UNPARSABLE_BEARER_TOKEN, m_request),
                         Tarvel::Xml::XMLParseException, "the document ends in a start tag at line 1, column 9");
@@ -263,7 +263,7 @@ TEST_F(RequestBuilderImplTest, AFailureWhileComposingLeavesTheBodyAsItWas) {
   EXPECT_EQ(m_request.body, "earlier");
 }
 
-TEST_F(RequestBuilderImplTest, SetsTheActionBeforeItComposesTheEnvelopeAndTheBodyAfterwards) {
+TEST_F(RequestBuilderImplTest, SetsTheActionBeforeAndTheBodyAfterItComposesTheEnvelope) {
   // A key that cannot sign is noticed when the envelope is composed.
   const RequestBuilderImpl builder(
       HolderOfKeyConfig{Tarvel::Crypto::CreatePrivateKey(ReadDataFile("tokens/sts-ec256.key")),
@@ -296,7 +296,7 @@ TEST_F(RequestBuilderImplTest, RefusesATextThatXmlCannotCarryWithoutQuotingThePa
   EXPECT_EQ(m_request.body, "");
 }
 
-TEST_F(RequestBuilderImplTest, ReplacesAnEarlierRequestAsAWhole) {
+TEST_F(RequestBuilderImplTest, ReplacesActionAndBodyOfAnEarlierRequest) {
   m_plain.BuildUserPassTokenRequest("u", "first-password", Spec(), m_request);
   m_plain.BuildValidateSubjectRequest(BEARER_TOKEN, m_request);
   EXPECT_EQ(m_request.soapAction, Request::VALIDATE);

@@ -17,14 +17,14 @@ TEST(Request, StartsWithTwoEmptyTexts) {
   EXPECT_EQ(request.body, "");
 }
 
-TEST(Request, NamesTheFourActions) {
+TEST(Request, HasFourActions) {
   EXPECT_STREQ(Request::ISSUE, "http://docs.oasis-open.org/ws-sx/ws-trust/200512/RST/Issue");
   EXPECT_STREQ(Request::RENEW, "http://docs.oasis-open.org/ws-sx/ws-trust/200512/RST/Renew");
   EXPECT_STREQ(Request::VALIDATE, "http://docs.oasis-open.org/ws-sx/ws-trust/200512/RST/Validate");
   EXPECT_STREQ(Request::CHALLANGE, "http://docs.oasis-open.org/ws-sx/ws-trust/200512/RSTR/Issue");
 }
 
-TEST(Request, IsCopiedMovedAndAssignedAsAWhole) {
+TEST(Request, CopiesMovesAndAssignsBothTexts) {
   Request original;
   original.soapAction = Request::RENEW;
   original.body = std::string(100, 'x');

@@ -79,7 +79,7 @@ void PrintTo(const Operation &operation, std::ostream *out) {
   *out << operation.name;
 }
 
-/// What holds whatever the operation is.
+/// Behaviour that all operations share.
 class EachResponse : public testing::TestWithParam<Operation> {
 protected:
   std::string Handle(const std::string &response) const { return GetParam().handle(response); }
@@ -96,7 +96,7 @@ TEST_P(EachResponse, IsRefusedWithTheParsersMessageWhenItIsNotXml) {
       "Response is not well-formed XML: a document type declaration is not accepted at line 1, column 1");
 }
 
-/// A text with a charset that somebody declared for it.
+/// A text with a declared charset.
 class DeclaredReader final : public Tarvel::Reader {
 public:
   DeclaredReader(const std::string &text, std::string charset)
@@ -109,7 +109,7 @@ private:
   const std::string m_charset;
 };
 
-TEST(ParseResponseDocument, SaysWhichCharsetWasDeclaredForWhatIsNotXml) {
+TEST(ParseResponseDocument, ReportsTheDeclaredCharsetOfTextThatIsNotXml) {
   const std::string refusal = "Response is not well-formed XML: the document is not UTF-8 at line 1, column 4";
   struct Case {
     const char *charset;
@@ -123,12 +123,12 @@ TEST(ParseResponseDocument, SaysWhichCharsetWasDeclaredForWhatIsNotXml) {
   }
 }
 
-TEST(ParseResponseDocument, DoesNotMindTheCharsetOfWhatIsXml) {
+TEST(ParseResponseDocument, IgnoresTheDeclaredCharsetOfXml) {
   const auto document = ParseResponseDocument(*Tarvel::MakeRef<DeclaredReader>("<a/>", "windows-1252"));
   EXPECT_EQ(document->GetName(), "a");
 }
 
-TEST_P(EachResponse, IsRefusedWithoutBodyWhateverElseItHolds) {
+TEST_P(EachResponse, IsRefusedWithoutBodyWhateverElseItContains) {
   const char message[] = "Unexpected response format: missing SAOP Body.";
   EXPECT_THROWS_MESSAGE(Handle("<Envelope/>"), SsoException, message);
   EXPECT_THROWS_MESSAGE(Handle("<Envelope><Fault><faultcode>a</faultcode></Fault></Envelope>"), SsoException, message);
@@ -141,11 +141,11 @@ TEST_P(EachResponse, IsRefusedWithAnEmptyBody) {
   EXPECT_THROWS_MESSAGE(Handle(Envelope("text <!-- and a comment -->")), SsoException, UNEXPECTED);
 }
 
-TEST_P(EachResponse, SeesAFaultOnlyAsAChildOfTheBody) {
+TEST_P(EachResponse, HasAFaultOnlyAsAChildOfTheBody) {
   EXPECT_THROWS_MESSAGE(Handle(Envelope("<x><Fault><faultcode>a</faultcode></Fault></x>")), SsoException, UNEXPECTED);
 }
 
-TEST_P(EachResponse, ReportsAFaultThoughThereIsAResultToo) {
+TEST_P(EachResponse, ReportsAFaultEvenIfThereIsAResult) {
   const std::string fault = "<Fault><faultcode>busy</faultcode></Fault>";
   EXPECT_THROWS_MESSAGE(Handle(Envelope(Collection(ResponseElement(Requested(ASSERTION))) + fault)), SsoException,
                         "Unexpected SOAP fault: busy; request failed.");
@@ -156,27 +156,27 @@ INSTANTIATE_TEST_SUITE_P(ResponseHandlerImpl, EachResponse,
                                          Operation{"Validate", Validate}, Operation{"Negotiate", Negotiate}),
                          [](const auto &operation) { return std::string(operation.param.name); });
 
-TEST(CheckSoapFault, TellsFailedAuthenticationByEachOfItsThreeNames) {
+TEST(CheckSoapFault, RecognisesFailedAuthenticationByEachOfItsThreeNames) {
   for (const char *code : {"wst:FailedAuthentication", "wst:InvalidSecurityToken", "wsse:InvalidSecurityToken"}) {
     EXPECT_THROWS_MESSAGE(Acquire(FaultResponse(code, "Wrong password")), InvalidCredentialsException,
                           "Authentication failed: Wrong password");
   }
 }
 
-TEST(CheckSoapFault, TellsThePrefixByTheDeclarationsAtTheFaultCodeAlone) {
+TEST(CheckSoapFault, ResolvesThePrefixByTheDeclarationsAtTheFaultCode) {
   EXPECT_THROWS_MESSAGE(
       Acquire("<Envelope><Body><Fault><faultcode xmlns:f='http://docs.oasis-open.org/ws-sx/ws-trust/200512'>"
               "f:FailedAuthentication</faultcode></Fault></Body></Envelope>"),
       InvalidCredentialsException, "Authentication failed");
 }
 
-TEST(CheckSoapFault, TakesNoDefaultNamespaceForThatOfAFaultCodeWithoutPrefix) {
+TEST(CheckSoapFault, IgnoresTheDefaultNamespaceForAFaultCodeWithoutPrefix) {
   EXPECT_THROWS_MESSAGE(Acquire("<Envelope xmlns='http://docs.oasis-open.org/ws-sx/ws-trust/200512'><Body><Fault>"
                                 "<faultcode>FailedAuthentication</faultcode></Fault></Body></Envelope>"),
                         SsoException, "Unexpected SOAP fault: FailedAuthentication; request failed.");
 }
 
-TEST(CheckSoapFault, AddsNothingForAFaultStringThatIsEmptyMissingOrNoText) {
+TEST(CheckSoapFault, AddsNothingForAFaultStringThatIsEmptyMissingOrNotText) {
   const std::string code = "<faultcode>wst:FailedAuthentication</faultcode>";
   for (const char *text : {"", "<faultstring/>", "<faultstring></faultstring>", "<faultstring><b>x</b></faultstring>",
                            "<faultstring><!-- x -->y</faultstring>"}) {
@@ -217,28 +217,28 @@ TEST(CheckSoapFault, RefusesAFaultCodeWhosePrefixIsNotBound) {
                         ParseException, "Element faultcodeat 2,1 uses undefined prefix: `p'");
 }
 
-TEST(HandleAcquireTokenResponse, YieldsTheCanonicalFormOfTheAssertionAsItStoodInTheResponse) {
+TEST(HandleAcquireTokenResponse, ReturnsTheCanonicalFormOfTheAssertionInTheResponse) {
   EXPECT_EQ(Acquire(Testing::IssueResponse(ASSERTION)), CANONICAL_ASSERTION);
 }
 
-TEST(HandleAcquireTokenResponse, ComparesLocalNamesAloneAndTakesTheFirstOfAName) {
+TEST(HandleAcquireTokenResponse, ComparesOnlyLocalNamesAndUsesTheFirstElementOfAName) {
   EXPECT_EQ(Acquire("<a><Body><RequestSecurityTokenResponseCollection><RequestSecurityTokenResponse>"
                     "<RequestedSecurityToken><x xmlns='urn:x'/><Assertion/><Assertion ID='2'/></RequestedSecurityToken>"
                     "</RequestSecurityTokenResponse></RequestSecurityTokenResponseCollection></Body></a>"),
             "<Assertion></Assertion>");
 }
 
-TEST(HandleAcquireTokenResponse, DoesNotGoBackForASecondElementOfAName) {
+TEST(HandleAcquireTokenResponse, DoesNotTryASecondElementOfAName) {
   EXPECT_THROWS_MESSAGE(Acquire(Envelope(Collection(ResponseElement("") + ResponseElement(Requested(ASSERTION))))),
                         SsoException, UNEXPECTED);
 }
 
-TEST(HandleAcquireTokenResponse, DoesNotLookAtTheTokenType) {
+TEST(HandleAcquireTokenResponse, IgnoresTheTokenType) {
   EXPECT_EQ(Acquire(Envelope(Collection(ResponseElement("<TokenType>urn:other</TokenType>" + Requested(ASSERTION))))),
             CANONICAL_ASSERTION);
 }
 
-TEST(HandleAcquireTokenResponse, RefusesAResponseThatLacksAStep) {
+TEST(HandleAcquireTokenResponse, RefusesAResponseInWhichAnElementOfThePathIsMissing) {
   for (const std::string &content :
        {ResponseElement(Requested(ASSERTION)), Collection(""), Collection(ResponseElement("")),
         Collection(ResponseElement("<RequestedSecurityToken/>")), Collection(Requested(ASSERTION)),
@@ -247,13 +247,13 @@ TEST(HandleAcquireTokenResponse, RefusesAResponseThatLacksAStep) {
   }
 }
 
-TEST(HandleAcquireTokenResponse, LetsTheRefusalOfAnAssertionWithoutCanonicalFormPassAsItIs) {
+TEST(HandleAcquireTokenResponse, PassesOnTheExceptionOfAnAssertionWithoutCanonicalForm) {
   EXPECT_THROWS_MESSAGE(Acquire(Testing::IssueResponse("<Assertion><p:a/></Assertion>")),
                         Tarvel::Xml::Security::XmlSecurityException,
                         "No canonical form: the prefix \"p\" is not bound at line 2, column 381");
 }
 
-TEST(HandleAcquireTokenResponse, LeavesTheTextAloneWhenItFails) {
+TEST(HandleAcquireTokenResponse, DoesNotChangeTheTextWhenItFails) {
   std::string token = "before";
   EXPECT_THROWS_MESSAGE(
       ResponseHandlerImpl().HandleAcquireTokenResponse(Tarvel::CreateStringReader(Envelope("")).get(), token),
@@ -261,11 +261,11 @@ TEST(HandleAcquireTokenResponse, LeavesTheTextAloneWhenItFails) {
   EXPECT_EQ(token, "before");
 }
 
-TEST(HandleRenewTokenResponse, YieldsTheCanonicalFormOfTheAssertion) {
+TEST(HandleRenewTokenResponse, ReturnsTheCanonicalFormOfTheAssertion) {
   EXPECT_EQ(Renew(Testing::RenewResponse(ASSERTION)), CANONICAL_ASSERTION);
 }
 
-TEST(HandleRenewTokenResponse, RefusesACollectionAndAResponseThatLacksAStep) {
+TEST(HandleRenewTokenResponse, RefusesACollectionAndAResponseInWhichAnElementOfThePathIsMissing) {
   for (const std::string &content :
        {Collection(ResponseElement(Requested(ASSERTION))), ResponseElement(""),
         ResponseElement("<RequestedSecurityToken/>"), ResponseElement(ASSERTION), Requested(ASSERTION)}) {
@@ -278,7 +278,7 @@ TEST(HandleValidateSubjectResponse, ReadsBothVerdicts) {
   EXPECT_EQ(Validate(Testing::ValidateResponse(INVALID)), "invalid");
 }
 
-TEST(HandleValidateSubjectResponse, ReadsTextThatStandsInCdataOrBeforeAComment) {
+TEST(HandleValidateSubjectResponse, ReadsTextInCdataOrBeforeAComment) {
   EXPECT_EQ(Validate(Testing::ValidateResponse("<![CDATA[" + std::string(VALID) + "]]>")), "valid");
   EXPECT_EQ(Validate(Testing::ValidateResponse(std::string(VALID) + "<!-- x -->")), "valid");
 }
@@ -294,7 +294,7 @@ TEST(HandleValidateSubjectResponse, RefusesAnyOtherText) {
   }
 }
 
-TEST(HandleValidateSubjectResponse, RefusesAResponseThatLacksAStep) {
+TEST(HandleValidateSubjectResponse, RefusesAResponseInWhichAnElementOfThePathIsMissing) {
   for (const std::string &content :
        {ResponseElement(""), ResponseElement("<Status/>"), ResponseElement("<Code>" + std::string(VALID) + "</Code>"),
         Collection(ResponseElement("<Status><Code>" + std::string(VALID) + "</Code></Status>"))}) {
@@ -316,14 +316,14 @@ TEST(HandleSPNegoResponse, ReadsAFinalLegWithExchangeAndToken) {
   EXPECT_EQ(leg.tokenXml, CANONICAL_ASSERTION);
 }
 
-TEST(HandleSPNegoResponse, ReplacesEveryFieldAlsoWhenTheFinalLegBringsNoExchange) {
+TEST(HandleSPNegoResponse, ReplacesEveryFieldEvenIfTheFinalLegHasNoExchange) {
   const SPNegoResponse leg = ReadLeg(Testing::FinalLeg("", "", ASSERTION));
   EXPECT_EQ(leg.contextId, "");
   EXPECT_EQ(leg.leg, std::vector<std::uint8_t>());
   EXPECT_EQ(leg.tokenXml, CANONICAL_ASSERTION);
 }
 
-TEST(HandleSPNegoResponse, TakesAResponseOutsideTheCollectionAsIntermediateWhateverElseThereIs) {
+TEST(HandleSPNegoResponse, ReadsAResponseOutsideTheCollectionAsIntermediateWhateverElseThereIs) {
   const std::string final = Testing::FinalLeg("final", "AQID", ASSERTION);
   const std::string intermediate = ResponseElement("<BinaryExchange>BAUG</BinaryExchange>", " Context='first'");
   const std::string body = "<soapenv:Body>";
@@ -370,7 +370,7 @@ TEST(HandleSPNegoResponse, RefusesAFinalLegWithoutToken) {
   }
 }
 
-TEST(HandleSPNegoResponse, ReportsOfAFinalLegTheFirstOfSeveralMistakes) {
+TEST(HandleSPNegoResponse, ReportsTheFirstOfSeveralFaultsOfAFinalLeg) {
   const auto final = [](const char *context, const std::string &content) {
     return Envelope(Collection(ResponseElement("<BinaryExchange>AQI</BinaryExchange>" + content, context)));
   };
@@ -389,7 +389,7 @@ TEST(HandleSPNegoResponse, RefusesAFinalLegOfAnotherTokenTypeWithAMessageWhosePa
                         "Invalid token type: urn:other (expected: urn:oasis:names:tc:SAML:2.0:assertion");
 }
 
-TEST(HandleSPNegoResponse, LeavesTheRecordAloneWhenItFails) {
+TEST(HandleSPNegoResponse, DoesNotChangeTheRecordWhenItFails) {
   SPNegoResponse leg{"before", {1}, "before"};
   const std::string response = Envelope(Collection(ResponseElement(Requested(ASSERTION), " Context='c'")));
   EXPECT_THROWS_MESSAGE(ResponseHandlerImpl().HandleSPNegoResponse(Tarvel::CreateStringReader(response).get(), leg),

@@ -20,7 +20,7 @@ constexpr bool HAS_NO_VIRTUAL_DESTRUCTOR = (!std::has_virtual_destructor_v<Class
 
 static_assert(HAS_NO_VIRTUAL_DESTRUCTOR<RequestBuilder, ResponseHandler, TransportSession, Transport>);
 
-TEST(RequestBuilder, HasItsOperationsInOneOrder) {
+TEST(RequestBuilder, HasItsOperationsInTheDeclaredOrder) {
   EXPECT_EQ(SlotOf(&RequestBuilder::BuildUserPassTokenRequest), 1);
   EXPECT_EQ(SlotOf(&RequestBuilder::BuildInitialSPNegoRequest), 2);
   EXPECT_EQ(SlotOf(&RequestBuilder::BuildContinuedSPNegoRequest), 3);
@@ -30,14 +30,14 @@ TEST(RequestBuilder, HasItsOperationsInOneOrder) {
   EXPECT_EQ(SlotOf(&RequestBuilder::BuildRenewRequest), 7);
 }
 
-TEST(ResponseHandler, HasItsOperationsInOneOrder) {
+TEST(ResponseHandler, HasItsOperationsInTheDeclaredOrder) {
   EXPECT_EQ(SlotOf(&ResponseHandler::HandleAcquireTokenResponse), 1);
   EXPECT_EQ(SlotOf(&ResponseHandler::HandleValidateSubjectResponse), 2);
   EXPECT_EQ(SlotOf(&ResponseHandler::HandleRenewTokenResponse), 3);
   EXPECT_EQ(SlotOf(&ResponseHandler::HandleSPNegoResponse), 4);
 }
 
-TEST(TransportSession, HasItsOperationsInOneOrder) {
+TEST(TransportSession, HasItsOperationsInTheDeclaredOrder) {
   EXPECT_EQ(SlotOf(&TransportSession::SendRequest), 1);
   EXPECT_EQ(SlotOf(&TransportSession::SendRequestAsync), 2);
 }

@@ -31,7 +31,7 @@ TEST(XMLBodyBuilderInitialSPNego, GivesEveryBuildANewContext) {
   }
 }
 
-TEST(XMLBodyBuilderInitialSPNego, EndsTheRequestInTheLegBehindUseKey) {
+TEST(XMLBodyBuilderInitialSPNego, EndsTheRequestWithTheLegAfterUseKey) {
   const auto builder =
       std::make_shared<const XMLBodyBuilderInitialSPNego>(SamlToken::HOLDER_OF_KEY, TokenSpec(), Leg{1, 2, 3});
   const std::string text = SerializeToXML(builder);
@@ -56,13 +56,13 @@ TEST(XMLBodyBuilderInitialSPNego, KeepsItsOwnCopyOfTheSpecAndTheLeg) {
   EXPECT_NE(text.find(">AQID</wst:BinaryExchange>"), std::string::npos);
 }
 
-TEST(XMLBodyBuilderContinuedSPNego, HoldsNothingButTheLegInTheGivenContext) {
+TEST(XMLBodyBuilderContinuedSPNego, ContainsOnlyTheLegInTheGivenContext) {
   const auto builder = std::make_shared<const XMLBodyBuilderContinuedSPNego>("ctx<&", Leg{1, 2, 3});
   EXPECT_EQ(SerializeToXML(builder), "<wst:RequestSecurityTokenResponse Context=\"ctx&lt;&amp;\">" + EXCHANGE_START +
                                          "AQID</wst:BinaryExchange></wst:RequestSecurityTokenResponse>");
 }
 
-TEST(XMLBodyBuilderContinuedSPNego, WritesAnEmptyContextToo) {
+TEST(XMLBodyBuilderContinuedSPNego, WritesEvenAnEmptyContext) {
   EXPECT_EQ(ContextOf(XMLBodyBuilderContinuedSPNego("", {})), "");
 }
 

@@ -28,7 +28,7 @@ TokenSpec Spec() {
   return spec;
 }
 
-TEST(CreateGssNegotiationContext, MakesAContextThatNegotiatesOverTlsAfterTheConfigurationIsGone) {
+TEST(CreateGssNegotiationContext, MakesAContextThatNegotiatesOverTlsAfterTheConfigurationIsDestroyed) {
   const Testing::PostingServer server({Testing::IntermediateLeg("ctx", "AQID"),
                                        Testing::FinalLeg("ctx", "BAUG", Testing::ReadDataFile("tokens/bearer.xml"))},
                                       Testing::TlsSettings());
@@ -73,7 +73,7 @@ TEST(CreateGssNegotiationContext, ReleasesTheSslContextWhenTheNegotiationIsDestr
   EXPECT_TRUE(*isDestroyed);
 }
 
-TEST(CreateGssNegotiationContext, GivesTheHolderOfKeyIdentityToTheRequests) {
+TEST(CreateGssNegotiationContext, SignsRequestsWithTheHolderOfKeyIdentity) {
   const Testing::PostingServer server(
       {Testing::IntermediateLeg("ctx", "AQID"), Testing::IntermediateLeg("ctx", "AQID")});
   SecurityTokenServiceConfig config = ConfigFor(server.GetUrl());
@@ -91,7 +91,7 @@ TEST(CreateGssNegotiationContext, RefusesAConfigurationWithoutTrustedCertificate
                         "Invalid argument : No STS trusted certificates provided");
 }
 
-TEST(CreateGssNegotiationContext, RefusesHttpsWithoutAContextAndAnAddressThatIsNone) {
+TEST(CreateGssNegotiationContext, RefusesHttpsWithoutAContextAndAnAddressThatIsNotValid) {
   EXPECT_THROWS_MESSAGE(CreateGssNegotiationContext(ConfigFor("https://localhost/"), Spec()),
                         Tarvel::InvalidArgumentException,
                         "Invalid argument : HTTPS connection requested but no SSLContext provided.");

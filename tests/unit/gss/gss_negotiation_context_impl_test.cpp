@@ -26,7 +26,7 @@ std::string Token(const std::string &name) {
   return Testing::ReadDataFile("tokens/" + name + ".xml");
 }
 
-/// A context whose service answers one leg after the other.
+/// A context whose service answers each leg with the next of the given responses.
 class GssNegotiation {
 public:
   explicit GssNegotiation(Texts answers)
@@ -46,7 +46,7 @@ private:
   const std::shared_ptr<GssNegotiationContext> m_context;
 };
 
-TEST(GssNegotiationContext, StartsWithAnInitialLegAndContinuesInTheContextThatTheServiceNamedLast) {
+TEST(GssNegotiationContext, StartsWithAnInitialLegAndContinuesInTheContextThatTheServiceReturnedLast) {
   const GssNegotiation negotiation({"leg:ctx1|s1|", "leg:ctx2|s2|", "leg:ctx2||" + Token("bearer")});
   const GssNegotiationResult first = negotiation.Negotiate("c1");
   EXPECT_EQ(*first.serverLeg, ToBytes("s1"));
@@ -65,7 +65,7 @@ TEST(GssNegotiationContext, ReturnsFinalServiceLegAndTokenInOneResult) {
   EXPECT_EQ(result.token->ToXml(), Token("bearer"));
 }
 
-TEST(GssNegotiationContext, StartsAgainWhenTheServiceNamedNoContext) {
+TEST(GssNegotiationContext, StartsAgainWhenTheServiceReturnedNoContext) {
   const GssNegotiation negotiation({"leg:|s1|", "leg:ctx|s2|", "leg:|s3|", "leg:ctx|s4|"});
   for (const char *leg : {"c1", "c2", "c3", "c4"}) {
     negotiation.Negotiate(leg);
@@ -74,7 +74,7 @@ TEST(GssNegotiationContext, StartsAgainWhenTheServiceNamedNoContext) {
                                        "1: InitialSPNego 60 c4"}));
 }
 
-TEST(GssNegotiationContext, ReturnsAListOfItsOwnForEachLegAndAnEmptyOneWhenTheServiceSentNone) {
+TEST(GssNegotiationContext, ReturnsANewListForEachLegAndAnEmptyOneWhenTheServiceSentNone) {
   const GssNegotiation negotiation({"leg:ctx||", "leg:ctx||"});
   const GssNegotiationResult first = negotiation.Negotiate("");
   const GssNegotiationResult second = negotiation.Negotiate("");
@@ -100,7 +100,7 @@ TEST(GssNegotiationContext, StaysInTheContextOfTheLastAnsweredLegWhenALegFails) 
                                        "1: ContinuedSPNego ctx c4"}));
 }
 
-TEST(GssNegotiationContext, LetsAParseExceptionOfTheTokenPassAsItIsWithTheContextNoted) {
+TEST(GssNegotiationContext, PassesOnAParseExceptionOfTheTokenAndKeepsTheContext) {
   const GssNegotiation negotiation({"leg:ctx||" + Token("expired"), "leg:ctx|s2|"});
   EXPECT_THROWS_MESSAGE(negotiation.Negotiate("c1"), ParseException,
                         "The token has expired at: 2021-01-01T00:00:00.000Z");
@@ -108,7 +108,7 @@ TEST(GssNegotiationContext, LetsAParseExceptionOfTheTokenPassAsItIsWithTheContex
   EXPECT_EQ(negotiation.Sent(), (Texts{"1: InitialSPNego 60 c1", "1: ContinuedSPNego ctx c2"}));
 }
 
-TEST(GssNegotiationContext, LetsAWrongSignaturePassAsItIs) {
+TEST(GssNegotiationContext, PassesOnTheExceptionOfAWrongSignature) {
   EXPECT_THROWS_MESSAGE(GssNegotiation({"leg:ctx||" + Token("signed-by-other")}).Negotiate("c1"),
                         InvalidSignatureException, "Failed to verify signature: token might have been tampered with.");
 }
@@ -119,7 +119,7 @@ TEST(GssNegotiationContext, WritesNoLogLine) {
   EXPECT_EQ(log.Lines(), Texts{});
 }
 
-TEST(GssNegotiationContext, IsRefusedWithoutTrustedCertificates) {
+TEST(GssNegotiationContext, CannotBeMadeWithoutTrustedCertificates) {
   const Testing::TransportStandIn transport([](const Request &) { return std::string(); });
   EXPECT_THROWS_MESSAGE(GssNegotiationContextImpl(
                             Testing::SpecFor(60), std::make_shared<const Testing::RequestBuilderStandIn>(),

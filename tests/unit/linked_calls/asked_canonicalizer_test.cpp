@@ -1,5 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
-// Which canonicalizer a token that is made from a tree asks the platform for.
+// Which canonicalizer the platform is asked for when a token is made from a tree.
 #include <ssoclient/create_saml_token.h>
 
 #include "support/data_file.h"
@@ -23,7 +23,7 @@ std::vector<std::string> g_askedFor;
 
 } // namespace
 
-// The linker calls the second one in place of the platform's function, which it leaves reachable as the first one.
+// The linker replaces the platform's function by the second of these. The first one is the platform's function.
 
 #define CREATE_CANONICALIZER                                                                                           \
   "_ZN6Tarvel3Xml8Security19CreateCanonicalizerESt17basic_string_viewIcSt11char_traitsIcEERKSt6vectorINSt7__cxx1112"   \

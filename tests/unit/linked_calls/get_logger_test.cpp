@@ -1,5 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
-// The first calls of `getLogger`, of which each has made a logger before any of them can publish one.
+// Concurrent first calls of `getLogger`: each has made a logger before any of them publishes one.
 #include <ssoclient/logger.h>
 
 #include "support/rendezvous.h"
@@ -36,7 +36,7 @@ private:
 
 } // namespace
 
-// The linker calls this in place of the platform's function.
+// The linker calls this instead of the platform's function.
 Ref<Logger> CreateLoggerAndWait(const Ref<LogRoot> &root, std::string name,
                                 int level) asm("__wrap__ZN6Tarvel7Service6Logger12CreateLoggerERKNS_3RefINS0_"
                                                "7LogRootEEENSt7__cxx1112basic_stringIcSt11char_traitsIcESa"
@@ -50,8 +50,8 @@ Ref<Logger> CreateLoggerAndWait(const Ref<LogRoot> &root, std::string name, int 
 
 namespace {
 
-// The one test of this program that asks for the logger: nobody has asked before.
-TEST(GetLogger, GivesThreadsThatAskFirstAtOnceOneLoggerAndReleasesTheOthers) {
+// The only test of this program that calls `getLogger`, so these are the first calls.
+TEST(GetLogger, ReturnsOneLoggerToThreadsThatCallItFirstAtTheSameTime) {
   std::vector<Logger *> loggers(THREADS);
   std::vector<std::thread> threads;
   for (Logger *&logger : loggers) {

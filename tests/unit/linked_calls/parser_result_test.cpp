@@ -1,5 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
-// What becomes of a parse that yields nothing, or something else than a document. The platform's own parser never does.
+// Parsers that return nothing, or an object that is not a document. The platform's own parser never does.
 #include "xml/xml_text.h"
 
 #include "support/throws_message.h"
@@ -27,7 +27,7 @@ public:
 
 class SomeObject final : public Tarvel::Object {};
 
-/// While it lives, parsing anything yields `result`.
+/// While it exists, every parse returns `result`.
 class ScopedParseResult {
 public:
   explicit ScopedParseResult(const Ref<Tarvel::Object> &result) { g_result = result; }
@@ -38,7 +38,7 @@ public:
 
 } // namespace
 
-// The linker calls the second one in place of the platform's function, which it leaves reachable as the first one.
+// The linker replaces the platform's function by the second of these. The first one is the platform's function.
 
 #define CREATE_PARSER "_ZN6Tarvel3Xml15CreateXMLParserERKNS_3RefINS0_10XMLHandlerEEE"
 
@@ -53,7 +53,7 @@ Ref<XMLParser> ReplacedCreateParser(const Ref<XMLHandler> &handler) {
 
 namespace {
 
-TEST(ParseXML, LeavesNoDocumentWhenTheParseYieldedNothing) {
+TEST(ParseXML, SetsNoDocumentWhenTheParserReturnsNothing) {
   Ref<Tarvel::Xml::Document> document;
   SsoClient::ParseXML("<first/>", document);
   ASSERT_TRUE(document);
@@ -70,7 +70,7 @@ TEST(ParseXML, RefusesAResultThatIsNotADocument) {
       "Type mismatch : expected Tarvel::Xml::Document, but the object is (anonymous namespace)::SomeObject");
 }
 
-TEST(CreateSamlToken, RefusesATextOfWhichTheParseYieldedNothing) {
+TEST(CreateSamlToken, RefusesATextForWhichTheParserReturnsNothing) {
   const ScopedParseResult nothing(nullptr);
   EXPECT_THROWS_MESSAGE(SsoClient::CreateSamlToken("<r/>", Tarvel::Crypto::CertificateList()),
                         SsoClient::ParseException, "Expected element 'Assertion' not found.");

@@ -1,5 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
-// The declared order of virtual functions and of fields: what callers were compiled against, and what braces initialise.
+// The declared order of virtual functions and of fields, on which compiled callers and braced initialisers rely.
 #include "support/declared_order.h"
 
 #include <ssoclient/exceptions.h>
@@ -22,7 +22,7 @@ using namespace SsoClient;
 using Testing::AreInOrder;
 using Testing::SlotOf;
 
-/// `Class` with one more virtual function, whose slot is the number of those that it had.
+/// `Class` with one more virtual function. Its slot is the number of virtual functions of `Class`.
 template <typename Class>
 class WithOneMore : public Class {
 public:

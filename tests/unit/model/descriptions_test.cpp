@@ -42,7 +42,7 @@ public:
   std::vector<Delegate> delegates;
 };
 
-TEST(WriteDelegate, TellsWhoAndWhen) {
+TEST(WriteDelegate, ContainsThePrincipalAndTheTime) {
   const Delegate delegate{{"gateway", "CORP"}, DateTime("2013-05-07T09:03:01.042Z")};
   EXPECT_EQ("{Name: gateway; Domain:CORP} at 2013-05-07T09:03:01.042Z", WriteDelegate(&delegate));
 }
@@ -67,13 +67,13 @@ TEST(AsString, SeparatesElements) {
   EXPECT_EQ("", AsString(std::vector<std::string>(), itself));
 }
 
-TEST(AsString, LeavesNoSeparatorAfterEmptyTextsAtTheBeginning) {
+TEST(AsString, WritesNoSeparatorAfterEmptyTextsAtTheBeginning) {
   const auto itself = [](const std::string *text) { return *text; };
   EXPECT_EQ("b", AsString(std::vector<std::string>{"", "b"}, itself));
   EXPECT_EQ("c", AsString(std::vector<std::string>{"", "", "c"}, itself));
 }
 
-TEST(AsString, LeavesTwoSeparatorsInARowForAnEmptyTextInTheMiddle) {
+TEST(AsString, WritesTwoSeparatorsForAnEmptyTextInTheMiddle) {
   const auto itself = [](const std::string *text) { return *text; };
   EXPECT_EQ("a, , c", AsString(std::vector<std::string>{"a", "", "c"}, itself));
 }
@@ -121,7 +121,7 @@ TEST(CreateRedactedDescription, WithGroupsAndDelegates) {
             CreateRedactedDescription(token));
 }
 
-TEST(CreateRedactedDescription, TellsNothingThatIsSecret) {
+TEST(CreateRedactedDescription, ContainsNothingSecret) {
   EXPECT_EQ(std::string::npos, CreateRedactedDescription(DescribedToken()).find("SECRET"));
 }
 

@@ -26,12 +26,12 @@ static_assert(!std::is_base_of_v<InvalidTokenException, InvalidCredentialsExcept
 static_assert(!std::is_base_of_v<SsoException, Tarvel::InvalidArgumentException>);
 static_assert(!std::is_base_of_v<SsoException, Tarvel::InvalidStateException>);
 
-TEST(Exceptions, TokenFailuresAreCaughtAtOnce) {
+TEST(Exceptions, OneBaseCatchesBothTokenFailures) {
   EXPECT_THROW(throw InvalidSignatureException("signature"), InvalidTokenException);
   EXPECT_THROW(throw ParseException("parse"), InvalidTokenException);
 }
 
-TEST(Exceptions, RootCatchesEveryClassOfTheLibrary) {
+TEST(Exceptions, BaseCatchesEveryClassOfTheLibrary) {
   EXPECT_THROW(throw InvalidTokenException("token"), SsoException);
   EXPECT_THROW(throw InvalidSignatureException("signature"), SsoException);
   EXPECT_THROW(throw ParseException("parse"), SsoException);
@@ -39,7 +39,7 @@ TEST(Exceptions, RootCatchesEveryClassOfTheLibrary) {
   EXPECT_THROW(throw InvalidCredentialsException("credentials"), SsoException);
 }
 
-TEST(Exceptions, RootDoesNotCatchThePlatformsArgumentAndStateExceptions) {
+TEST(Exceptions, BaseDoesNotCatchThePlatformsArgumentAndStateExceptions) {
   const auto caughtAsSsoException = [](const auto &exception) {
     try {
       throw exception;
@@ -53,7 +53,7 @@ TEST(Exceptions, RootDoesNotCatchThePlatformsArgumentAndStateExceptions) {
   EXPECT_FALSE(caughtAsSsoException(Tarvel::InvalidStateException("state")));
 }
 
-TEST(Exceptions, CloneOfParseExceptionHeldByItsRootIsAParseException) {
+TEST(Exceptions, CloneOfAParseExceptionThroughItsBaseIsAParseException) {
   const ParseException original("what went wrong");
   const SsoException &held = original;
   const std::unique_ptr<Tarvel::Exception> clone(held.Clone());
@@ -70,7 +70,7 @@ using AllExceptions = ::testing::Types<SsoException, InvalidTokenException, Inva
                                        CommunicationException, InvalidCredentialsException>;
 TYPED_TEST_SUITE(EachException, AllExceptions);
 
-TYPED_TEST(EachException, ClonesAndThrowsAsItsOwnClass) {
+TYPED_TEST(EachException, IsClonedAndThrownAsItsOwnClass) {
   std::unique_ptr<Tarvel::Exception> clone;
   {
     const TypeParam original("the message");
@@ -83,7 +83,7 @@ TYPED_TEST(EachException, ClonesAndThrowsAsItsOwnClass) {
   EXPECT_STREQ(clone->what(), "the message");
 }
 
-TYPED_TEST(EachException, KeepsWhatThePlatformKeeps) {
+TYPED_TEST(EachException, KeepsMessageAndCallStack) {
   const TypeParam exception("the message");
   EXPECT_STREQ("the message", exception.what());
   EXPECT_NE("", exception.GetBacktrace());

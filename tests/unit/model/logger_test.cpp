@@ -16,8 +16,8 @@ namespace {
 using SsoClient::getLogger;
 using Tarvel::Service::LogInternal;
 
-// First in this file, because each test that the test driver starts is a process of its own: here nobody has asked yet.
-TEST(GetLogger, GivesThreadsThatAskFirstAtOnceTheSameLogger) {
+// First in this file. The test driver starts a process for each test, so these are the first calls.
+TEST(GetLogger, ReturnsTheSameLoggerToThreadsThatCallItFirstAtTheSameTime) {
   constexpr std::size_t THREADS = 8;
   std::atomic<std::size_t> ready{0};
   std::vector<Tarvel::Service::Logger *> loggers(THREADS);
@@ -36,7 +36,7 @@ TEST(GetLogger, GivesThreadsThatAskFirstAtOnceTheSameLogger) {
   EXPECT_EQ(std::vector<Tarvel::Service::Logger *>(THREADS, &getLogger()), loggers);
 }
 
-TEST(GetLogger, IsNamedAfterTheLibraryAndLetsOperationsThrough) {
+TEST(GetLogger, HasTheNameOfTheLibraryAndTheLevelOfOperations) {
   EXPECT_EQ("SsoClient", getLogger().GetName());
   EXPECT_EQ(64, getLogger().GetLevel());
 }

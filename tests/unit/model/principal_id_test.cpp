@@ -28,13 +28,13 @@ TEST(PrincipalIdEquality, IgnoresLetterCaseBeyondAscii) {
   EXPECT_TRUE((PrincipalId{"j\u00fcrgen", "corp"} == PrincipalId{"J\u00dcRGEN", "CORP"}));
 }
 
-TEST(PrincipalIdEquality, JoinsDistinctLettersOfOneUpperCaseForm) {
+TEST(PrincipalIdEquality, HoldsForDistinctLettersOfOneUpperCaseForm) {
   EXPECT_TRUE((PrincipalId{"\u0131ris", "corp"} == PrincipalId{"iris", "corp"}));     // dotless i
   EXPECT_TRUE((PrincipalId{"alice", "\u017fales"} == PrincipalId{"alice", "sales"})); // long s
   EXPECT_FALSE((PrincipalId{"\u0130ris", "corp"} == PrincipalId{"iris", "corp"}));    // I with a dot stays itself
 }
 
-TEST(PrincipalIdEquality, TellsOtherNamesAndDomainsApart) {
+TEST(PrincipalIdEquality, DoesNotHoldForOtherNamesAndDomains) {
   const PrincipalId alice{"alice", "corp"};
   EXPECT_FALSE((alice == PrincipalId{"bob", "corp"}));
   EXPECT_FALSE((alice == PrincipalId{"alice", "branch"}));
@@ -123,7 +123,7 @@ TEST(PrincipalIdToString, HasNoBlankAfterTheDomainLabel) {
   EXPECT_EQ("{Name: ; Domain:}", PrincipalId{}.ToString());
 }
 
-TEST(PrincipalIdToString, TakesPlaceholdersInNamesAsText) {
+TEST(PrincipalIdToString, WritesPlaceholdersInNamesAsText) {
   EXPECT_EQ("{Name: %2; Domain:%1}", (PrincipalId{"%2", "%1"}).ToString());
 }
 

@@ -72,7 +72,7 @@ TEST(TokenSpec, StartsWithNothingRequested) {
   EXPECT_EQ(TokenSpec::CONFIRMATION_DEFAULT, spec.confirmation);
 }
 
-TEST(TokenSpec, TakesZeroAndNegativeLifetimesAsTheyAre) {
+TEST(TokenSpec, KeepsZeroAndNegativeLifetimes) {
   TokenSpec spec;
   for (const std::int64_t lifetime : {std::int64_t{0}, std::int64_t{-1}, std::numeric_limits<std::int64_t>::min()}) {
     spec.tokenLifetimeSec = lifetime;
@@ -80,7 +80,7 @@ TEST(TokenSpec, TakesZeroAndNegativeLifetimesAsTheyAre) {
   }
 }
 
-TEST(TokenSpec, CopyHasAllFieldsAndLeavesItsSource) {
+TEST(TokenSpec, CopyHasAllFieldsAndDoesNotChangeItsSource) {
   const TokenSpec source = MakeSpec();
   const TokenSpec copy(source);
   ExpectAllFields(copy);

@@ -46,6 +46,7 @@ bool IsReady(const std::future<Result> &future) {
 /// The code with which a future fails whose operation ended without a call of its completion.
 template <typename Result>
 std::error_code BrokenPromiseOf(std::future<Result> future) {
+  EXPECT_TRUE(IsReady(future));
   try {
     future.get();
   } catch (const std::future_error &error) {

@@ -99,7 +99,7 @@ protected:
   const std::shared_ptr<EventCount> m_tokenGone = std::make_shared<EventCount>();
 };
 
-TEST_P(EachAsyncOperation, RunsOnAnotherThreadAndCallsBackOnceThere) {
+TEST_P(EachAsyncOperation, RunsOnAnotherThreadAndCallsItsCompletionOnceThere) {
   const RecordedLog log;
   auto transport =
       MakeCounted<TransportStandIn>(m_transportGone, [response = Response()](const Request &) { return response; });
@@ -108,13 +108,13 @@ TEST_P(EachAsyncOperation, RunsOnAnotherThreadAndCallsBackOnceThere) {
   EXPECT_EQ(outcome.Wait(), Texts{Result()});
   EXPECT_EQ(transport->Sent(), Texts{GetParam().request});
   transport.reset();
-  ASSERT_TRUE(m_transportGone->WaitFor(1)); // the work item is over
+  ASSERT_TRUE(m_transportGone->WaitFor(1)); // the work item has ended
   EXPECT_EQ(outcome.Wait().size(), 1u);
   EXPECT_EQ(outcome.Threads().count(std::this_thread::get_id()), 0u);
-  EXPECT_EQ(log.Threads(), outcome.Threads()); // from the first line on, it all ran there
+  EXPECT_EQ(log.Threads(), outcome.Threads()); // everything ran there, from the first line on
 }
 
-TEST_P(EachAsyncOperation, KeepsWhatItNeedsUntilItIsDoneAndNoLonger) {
+TEST_P(EachAsyncOperation, KeepsItsArgumentsUntilItEndsAndNoLonger) {
   const auto gate = std::make_shared<Gate>();
   auto transport = MakeCounted<TransportStandIn>(m_transportGone, [gate, response = Response()](const Request &) {
     gate->Pass();
@@ -135,7 +135,7 @@ TEST_P(EachAsyncOperation, KeepsWhatItNeedsUntilItIsDoneAndNoLonger) {
   EXPECT_TRUE(m_tokenGone->WaitFor(1));
 }
 
-TEST_P(EachAsyncOperation, ReportsAFailureOnceWithNothingButTheException) {
+TEST_P(EachAsyncOperation, ReportsAFailureOnceWithTheExceptionAlone) {
   auto transport = MakeCounted<TransportStandIn>(m_transportGone, [](const Request &) { return "fault:refused"; });
   const OperationOutcome outcome;
   GetParam().start(*ServiceOn(transport), std::make_shared<CountingToken>(), outcome);
@@ -146,7 +146,7 @@ TEST_P(EachAsyncOperation, ReportsAFailureOnceWithNothingButTheException) {
   EXPECT_EQ(outcome.Threads().count(std::this_thread::get_id()), 0u);
 }
 
-TEST_P(EachAsyncOperation, LetsAnExceptionOfAnotherKindLeaveThePoolsItemWithoutCallingBack) {
+TEST_P(EachAsyncOperation, DoesNotCallItsCompletionForAnExceptionOfAnotherKind) {
   const RecordedLog log;
   const Testing::ScopedLogLevel level(63);
   auto transport = MakeCounted<TransportStandIn>(
@@ -174,7 +174,7 @@ TEST(ValidateSubjectAsync, ReportsAnInvalidTokenAsAVerdictAndNotAsAFailure) {
   EXPECT_EQ(outcome.Wait(), Texts{"false"});
 }
 
-TEST(AcquireTokenAsync, ReportsNullAndNoExceptionWhenTheResponseHoldsNoToken) {
+TEST(AcquireTokenAsync, ReportsNullAndNoExceptionWhenTheResponseContainsNoToken) {
   const OperationOutcome outcome;
   ServiceThatAnswers("issued:")->AcquireTokenAsync("alice", "pass", SpecFor(60), outcome.ForToken());
   EXPECT_EQ(outcome.Wait(), Texts{"null"});
@@ -193,7 +193,7 @@ TEST(AsyncOperations, ReportAMissingTokenOrHandlerAsABadArgument) {
   EXPECT_EQ(verdict.Wait(), Texts{"empty " + failure});
 }
 
-TEST(AsyncOperations, AreLoggedByThePoolWhenTheCompletionThrowsAndThePoolGoesOn) {
+TEST(AsyncOperations, LogAnExceptionOfTheCompletionAndThePoolContinues) {
   const RecordedLog log;
   const Testing::ScopedLogLevel level(63);
   const auto service = ServiceThatAnswers("issued:");
@@ -215,7 +215,7 @@ TEST(AsyncOperations, AreLoggedByThePoolWhenTheCompletionThrowsAndThePoolGoesOn)
   EXPECT_EQ(outcome.Wait(), Texts{"null"});
 }
 
-TEST(AsyncOperations, LeaveAnExceptionThatTheCompletionClonesToItsHolder) {
+TEST(AsyncOperations, LeaveAClonedExceptionToItsOwner) {
   std::unique_ptr<const Tarvel::Exception> kept;
   EventCount called;
   ServiceThatAnswers("fault:refused")
@@ -227,7 +227,7 @@ TEST(AsyncOperations, LeaveAnExceptionThatTheCompletionClonesToItsHolder) {
   EXPECT_THROWS_MESSAGE(kept->Throw(), InvalidCredentialsException, "refused");
 }
 
-TEST(AsyncOperations, CompleteAThousandThatWereInFlightWhenTheServiceStalled) {
+TEST(AsyncOperations, AllCompleteWhenAThousandWaitForAServiceThatStalls) {
   constexpr int OPERATIONS = 1000;
   const Testing::ScopedLogLevel level(63);
   const auto gate = std::make_shared<Gate>();

@@ -23,8 +23,8 @@ namespace {
 using Testing::ReadDataFile;
 using Testing::SpecFor;
 
-/// Answers one response after the other.
-class CannedResponses : public testing::Test {
+/// Each request gets the next of the given responses.
+class ServiceWithCannedResponses : public testing::Test {
 protected:
   std::shared_ptr<const SecurityTokenService> ServiceThatAnswers(const std::vector<std::string> &responses) {
     m_transport = std::make_shared<Testing::TransportStandIn>(
@@ -44,7 +44,7 @@ protected:
   void ExpectAlicesToken(const std::shared_ptr<const SamlToken> &token) const {
     ASSERT_NE(token, nullptr);
     EXPECT_EQ(token->GetSubject().ToString(), "{Name: alice; Domain:corp.example}");
-    // What came out of the envelope stands on its own.
+    // The assertion is a document of its own.
     EXPECT_NE(CreateSamlToken(token->ToXml(), Testing::TrustedCertificates()), nullptr);
   }
 
@@ -53,24 +53,24 @@ protected:
   std::vector<std::string> m_actions;
 };
 
-TEST_F(CannedResponses, LetATokenBeAcquiredByPassword) {
+TEST_F(ServiceWithCannedResponses, AcquiresATokenByPassword) {
   ExpectAlicesToken(
       ServiceThatAnswers({Testing::IssueResponse(m_bearer)})->AcquireToken("alice@corp.example", "pass", SpecFor(60)));
   EXPECT_EQ(m_actions, std::vector<std::string>{Request::ISSUE});
 }
 
-TEST_F(CannedResponses, LetATokenBeAcquiredByCertificate) {
+TEST_F(ServiceWithCannedResponses, AcquiresATokenByCertificate) {
   ExpectAlicesToken(ServiceThatAnswers({Testing::IssueResponse(m_bearer)})->AcquireTokenByCertificate(SpecFor(60)));
   EXPECT_EQ(m_actions, std::vector<std::string>{Request::ISSUE});
 }
 
-TEST_F(CannedResponses, LetATokenBeExchanged) {
+TEST_F(ServiceWithCannedResponses, ExchangesAToken) {
   ExpectAlicesToken(
       ServiceThatAnswers({Testing::IssueResponse(m_bearer)})->AcquireTokenByToken(*HeldToken(), SpecFor(60)));
   EXPECT_EQ(m_actions, std::vector<std::string>{Request::ISSUE});
 }
 
-TEST_F(CannedResponses, LetATokenBeNegotiated) {
+TEST_F(ServiceWithCannedResponses, NegotiatesAToken) {
   const auto encode = [](const std::string &text) { return Tarvel::StringUtil::Base64Encode(Testing::ToBytes(text)); };
   const auto service = ServiceThatAnswers(
       {Testing::IntermediateLeg("ctx", encode("s1")), Testing::FinalLeg("ctx", encode("s2"), m_bearer)});
@@ -81,7 +81,7 @@ TEST_F(CannedResponses, LetATokenBeNegotiated) {
   EXPECT_EQ(m_transport->CountSessions(), 1);
 }
 
-TEST_F(CannedResponses, LetATokenBeValidated) {
+TEST_F(ServiceWithCannedResponses, ValidatesAToken) {
   const std::string status = "http://docs.oasis-open.org/ws-sx/ws-trust/200512/status/";
   const auto service =
       ServiceThatAnswers({Testing::ValidateResponse(status + "valid"), Testing::ValidateResponse(status + "invalid")});
@@ -90,18 +90,18 @@ TEST_F(CannedResponses, LetATokenBeValidated) {
   EXPECT_EQ(m_actions, (std::vector<std::string>{Request::VALIDATE, Request::VALIDATE}));
 }
 
-TEST_F(CannedResponses, LetATokenBeRenewed) {
+TEST_F(ServiceWithCannedResponses, RenewsAToken) {
   ExpectAlicesToken(ServiceThatAnswers({Testing::RenewResponse(m_bearer)})->RenewToken(*HeldToken(), 60));
   EXPECT_EQ(m_actions, std::vector<std::string>{Request::RENEW});
 }
 
-TEST_F(CannedResponses, LetAWrongPasswordBeReported) {
+TEST_F(ServiceWithCannedResponses, ReportsAWrongPassword) {
   const auto service = ServiceThatAnswers({Testing::FaultResponse("wst:FailedAuthentication", "Who are you?")});
   EXPECT_THROWS_MESSAGE(service->AcquireToken("alice@corp.example", "pass", SpecFor(60)), InvalidCredentialsException,
                         "Authentication failed: Who are you?");
 }
 
-TEST_F(CannedResponses, AreNotAskedForWhenTheRequestCannotBeBuilt) {
+TEST_F(ServiceWithCannedResponses, SendsNothingWhenTheRequestCannotBeBuilt) {
   const auto service = ServiceThatAnswers({});
   EXPECT_THROWS_MESSAGE(service->AcquireToken("alice@corp.example", "pass", SpecFor(0)),
                         Tarvel::InvalidArgumentException, "Invalid argument : Token lifetime must be positive");

@@ -32,7 +32,7 @@ std::string Issued() {
   return Testing::IssueResponse(Testing::ReadDataFile("tokens/bearer.xml"));
 }
 
-TEST(CreateSecurityTokenService, MakesAServiceThatAcquiresTokensOverTlsAfterTheConfigurationIsGone) {
+TEST(CreateSecurityTokenService, MakesAServiceThatAcquiresTokensOverTlsAfterTheConfigurationIsDestroyed) {
   const PostingServer server({Issued()}, Testing::TlsSettings());
   const auto context = Testing::ContextThatTrustsTheTestAuthority();
   std::shared_ptr<const SecurityTokenService> service;
@@ -74,12 +74,12 @@ TEST(CreateSecurityTokenService, ReleasesTheContextWhenTheServiceIsDestroyed) {
   EXPECT_TRUE(*isDestroyed);
 }
 
-TEST(CreateSecurityTokenService, GivesTheSslParameterToTheHandshake) {
+TEST(CreateSecurityTokenService, PassesTheSslParameterToTheHandshake) {
   const PostingServer server({Issued()}, Testing::TlsSettings());
   const auto context = Testing::ContextThatTrustsTheTestAuthority();
   SecurityTokenServiceConfig config = ConfigFor(server.GetUrl());
   config.sslContext = context.get();
-  config.sslParameter = std::string(64, '0'); // the thumbprint of no certificate
+  config.sslParameter = std::string(64, '0'); // not the thumbprint of any certificate
   const auto shown = Tarvel::Crypto::CreateCertificateFromPem(Testing::ReadDataFile("tls/localhost.crt"));
   EXPECT_THROWS_MESSAGE(
       CreateSecurityTokenService(config)->AcquireToken("alice@corp.example", "pass", Spec()), CommunicationException,
@@ -87,7 +87,7 @@ TEST(CreateSecurityTokenService, GivesTheSslParameterToTheHandshake) {
           shown->GetSha256Thumbprint() + " instead of " + config.sslParameter);
 }
 
-TEST(CreateSecurityTokenService, GivesTheHolderOfKeyIdentityToTheRequests) {
+TEST(CreateSecurityTokenService, SignsRequestsWithTheHolderOfKeyIdentity) {
   const PostingServer server({Issued()});
   SecurityTokenServiceConfig config = ConfigFor(server.GetUrl());
   EXPECT_THROWS_MESSAGE(CreateSecurityTokenService(config)->AcquireTokenByCertificate(Spec()),
@@ -105,14 +105,14 @@ TEST(CreateSecurityTokenService, RefusesAnIdentityWithoutKeyAndCertificate) {
                         "Invalid argument : HolderOfKeyConfig lacks its private key or its certificate");
 }
 
-TEST(CreateSecurityTokenService, RefusesHttpsWithoutAContextAndAnAddressThatIsNone) {
+TEST(CreateSecurityTokenService, RefusesHttpsWithoutAContextAndAnAddressThatIsNotValid) {
   EXPECT_THROWS_MESSAGE(CreateSecurityTokenService(ConfigFor("https://localhost/")), Tarvel::InvalidArgumentException,
                         "Invalid argument : HTTPS connection requested but no SSLContext provided.");
   EXPECT_THROWS_MESSAGE(CreateSecurityTokenService(ConfigFor("localhost")), Tarvel::Http::MalformedURLException,
                         "Malformed URL \"localhost\": the scheme is not http or https");
 }
 
-TEST(CreateSecurityTokenService, TakesAnEmptyListOfCertificatesThoughNoTokenWillBeAccepted) {
+TEST(CreateSecurityTokenService, AcceptsAnEmptyListOfCertificatesAlthoughNoTokenWillBeAccepted) {
   const PostingServer server({Issued()});
   SecurityTokenServiceConfig config = ConfigFor(server.GetUrl());
   config.signingCertificates.clear();

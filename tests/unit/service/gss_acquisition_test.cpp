@@ -30,7 +30,7 @@ std::string IssuedToken() {
   return Testing::ReadDataFile("tokens/bearer-minimal.xml");
 }
 
-/// A service that answers one leg after the other.
+/// A service that answers each leg with the next of the given responses.
 class GssAcquisition {
 public:
   explicit GssAcquisition(Texts answers)
@@ -62,7 +62,7 @@ const char ACQUIRED[] =
 
 const char CONTRACT_WARNING[] = "SsoClient 8 GSS contract error: non-empty user leg after negotiation is complete";
 
-TEST(AcquireTokenByGss, CarriesAllLegsOverOneSession) {
+TEST(AcquireTokenByGss, SendsAllLegsInOneSession) {
   const GssAcquisition acquisition({"leg:ctx1|s1|", "leg:ctx2|s2|", "leg:ctx3||" + IssuedToken()});
   NegotiationHandlerStandIn handler({Leg("c1"), Leg("c2"), Leg("c3")});
   const auto token = acquisition.Acquire(handler);
@@ -75,7 +75,7 @@ TEST(AcquireTokenByGss, CarriesAllLegsOverOneSession) {
   EXPECT_EQ(acquisition.transport->CountOpenSessions(), 0);
 }
 
-/// Notes how many sessions there are when it is asked for a leg.
+/// Records the number of sessions at each call.
 class SessionCountingHandler final : public NegotiationHandler {
 public:
   explicit SessionCountingHandler(const TransportStandIn &transport) : m_transport(transport) {}
@@ -98,7 +98,7 @@ TEST(AcquireTokenByGss, CreatesItsSessionBeforeItAsksForTheFirstLeg) {
   EXPECT_EQ(handler.sessions, (std::vector<int>{1, 1}));
 }
 
-TEST(AcquireTokenByGss, SendsNothingWhenTheFirstLegIsNullAndLogsTheEndAllTheSame) {
+TEST(AcquireTokenByGss, SendsNothingWhenTheFirstLegIsNullButLogsTheEnd) {
   const Testing::FixedEnvironment environment;
   const RecordedLog log;
   const GssAcquisition acquisition({});
@@ -117,14 +117,14 @@ TEST(AcquireTokenByGss, RefusesANullLegInTheMiddle) {
   EXPECT_EQ(acquisition.transport->CountOpenSessions(), 0);
 }
 
-TEST(AcquireTokenByGss, SendsAnEmptyLegAsItIs) {
+TEST(AcquireTokenByGss, SendsAnEmptyLegUnchanged) {
   const GssAcquisition acquisition({"leg:ctx|s1|", "leg:ctx||" + IssuedToken()});
   NegotiationHandlerStandIn handler({Leg(""), Leg("")});
   EXPECT_NE(acquisition.Acquire(handler), nullptr);
   EXPECT_EQ(acquisition.transport->Sent(), (Texts{"1: InitialSPNego 60 ", "1: ContinuedSPNego ctx "}));
 }
 
-TEST(AcquireTokenByGss, RefusesAFirstAnswerWithoutContextIdEvenWithAToken) {
+TEST(AcquireTokenByGss, RefusesAFirstResponseWithoutContextIdEvenIfItHasAToken) {
   const Testing::FixedEnvironment environment;
   const RecordedLog log;
   const GssAcquisition acquisition({"leg:|s1|" + IssuedToken()});
@@ -134,7 +134,7 @@ TEST(AcquireTokenByGss, RefusesAFirstAnswerWithoutContextIdEvenWithAToken) {
   EXPECT_EQ(log.Lines(), START_AND_END);
 }
 
-TEST(AcquireTokenByGss, RefusesALaterAnswerWithoutContextId) {
+TEST(AcquireTokenByGss, RefusesALaterResponseWithoutContextId) {
   const GssAcquisition acquisition({"leg:ctx|s1|", "leg:|s2|"});
   NegotiationHandlerStandIn handler({Leg("c1"), Leg("c2")});
   EXPECT_THROWS_MESSAGE(acquisition.Acquire(handler), CommunicationException,
@@ -159,7 +159,7 @@ struct FinalAnswer {
 
 class AcquireTokenByGssFinalLeg : public testing::TestWithParam<FinalAnswer> {};
 
-TEST_P(AcquireTokenByGssFinalLeg, GoesToTheHandlerWhoseAnswerIsNeverSent) {
+TEST_P(AcquireTokenByGssFinalLeg, IsPassedToTheHandlerWhoseAnswerIsNeverSent) {
   const Testing::FixedEnvironment environment;
   const RecordedLog log;
   const GssAcquisition acquisition({"leg:ctx|final|" + IssuedToken()});
@@ -175,12 +175,12 @@ TEST_P(AcquireTokenByGssFinalLeg, GoesToTheHandlerWhoseAnswerIsNeverSent) {
   EXPECT_EQ(log.Lines(), lines);
 }
 
-INSTANTIATE_TEST_SUITE_P(WarnsOfNothingAsAnswer, AcquireTokenByGssFinalLeg,
+INSTANTIATE_TEST_SUITE_P(WarnsWhenTheAnswerIsNothing, AcquireTokenByGssFinalLeg,
                          testing::Values(FinalAnswer{"Null", nullptr, true}, FinalAnswer{"Empty", Leg(""), true},
                                          FinalAnswer{"NonEmpty", Leg("x"), false}),
                          [](const auto &answer) { return std::string(answer.param.name); });
 
-TEST(AcquireTokenByGss, WarnsOfABrokenContractDownToLevelEightAndBelowItNoMore) {
+TEST(AcquireTokenByGss, WarnsOfABrokenContractAtLevelEightAndNotBelow) {
   for (const int level : {8, 7}) {
     const Testing::ScopedLogLevel scope(level);
     const RecordedLog log;
@@ -191,7 +191,7 @@ TEST(AcquireTokenByGss, WarnsOfABrokenContractDownToLevelEightAndBelowItNoMore) 
   }
 }
 
-TEST(AcquireTokenByGss, LetsWhatTheHandlerThrowsPassAsItIs) {
+TEST(AcquireTokenByGss, PassesOnAnExceptionOfTheHandler) {
   class ThrowingHandler final : public NegotiationHandler {
     std::shared_ptr<Bytes> NegotiateLeg(const Bytes &) override { throw std::range_error("no ticket"); }
   } handler;

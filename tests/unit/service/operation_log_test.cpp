@@ -1,5 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
-// What the log says of each operation, whole, so that nothing secret can be in it.
+// Compares the whole log of each operation, so that nothing secret can be in it.
 #include "support/counting_token.h"
 #include "support/data_file.h"
 #include "support/fixed_environment.h"
@@ -48,11 +48,11 @@ TokenSpec Spec() {
 
 struct LoggedOperation {
   const char *name;
-  const char *response; ///< what stands before the token in the response
+  const char *response; ///< the text before the token in the response
   bool yieldsToken;
   std::function<void(const SecurityTokenService &, const SamlToken &)> run;
-  Texts request; ///< the lines that tell what is asked for
-  Texts result;  ///< the lines of a success before that of the token
+  Texts request; ///< the lines about the request
+  Texts result;  ///< the lines about success before the one about the token
 };
 
 void PrintTo(const LoggedOperation &operation, std::ostream *out) {
@@ -135,7 +135,7 @@ protected:
   CountingToken m_token;
 };
 
-TEST_P(OperationLog, TellsStartRequestResultAndEndAndNothingSecret) {
+TEST_P(OperationLog, ContainsStartRequestResultAndEndAndNothingSecret) {
   const Testing::FixedEnvironment environment;
   const RecordedLog log;
   Run(Response());
@@ -146,7 +146,7 @@ TEST_P(OperationLog, TellsStartRequestResultAndEndAndNothingSecret) {
   }
 }
 
-TEST_P(OperationLog, TellsStartRequestAndEndOfAnOperationThatFails) {
+TEST_P(OperationLog, ContainsStartRequestAndEndOfAnOperationThatFails) {
   const Testing::FixedEnvironment environment;
   const RecordedLog log;
   EXPECT_THROWS_MESSAGE(Run("fault:refused"), InvalidCredentialsException, "refused");
@@ -154,7 +154,7 @@ TEST_P(OperationLog, TellsStartRequestAndEndOfAnOperationThatFails) {
   EXPECT_EQ(log.Lines(), FrameOf(GetParam().name, {GetParam().request, processing}));
 }
 
-TEST_P(OperationLog, TellsStartRequestAndEndWhenTheRequestCannotBeBuiltAndNoSendingOfIt) {
+TEST_P(OperationLog, ContainsStartRequestAndEndButNoSendingWhenTheRequestCannotBeBuilt) {
   const Testing::FixedEnvironment environment;
   const RecordedLog log;
   const auto refuse = [] { throw Tarvel::InvalidArgumentException("no such lifetime"); };
@@ -171,7 +171,7 @@ TEST_P(OperationLog, TellsStartRequestAndEndWhenTheRequestCannotBeBuiltAndNoSend
   EXPECT_EQ(transport->CountOpenSessions(), 0);
 }
 
-TEST_P(OperationLog, TellsStartRequestAndEndWhenTheTransportFailsAndNoProcessingOfAResponse) {
+TEST_P(OperationLog, ContainsStartRequestAndEndButNoProcessingWhenTheTransportFails) {
   const Testing::FixedEnvironment environment;
   const RecordedLog log;
   const auto transport = std::make_shared<Testing::TransportStandIn>(
@@ -193,7 +193,7 @@ INSTANTIATE_TEST_SUITE_P(EachOperation, OperationLog, testing::ValuesIn(LoggedOp
 
 class OperationLogOfAWrongToken : public OperationLog {};
 
-TEST_P(OperationLogOfAWrongToken, TellsOfNoSuccess) {
+TEST_P(OperationLogOfAWrongToken, DoesNotReportSuccess) {
   const Testing::FixedEnvironment environment;
   const RecordedLog log;
   EXPECT_THROWS_MESSAGE(Run(GetParam().response + Testing::ReadDataFile("tokens/signed-by-other.xml")),
@@ -211,7 +211,7 @@ std::vector<LoggedOperation> LoggedTokenOperations() {
 INSTANTIATE_TEST_SUITE_P(EachTokenOperation, OperationLogOfAWrongToken, testing::ValuesIn(LoggedTokenOperations()),
                          [](const auto &operation) { return std::string(operation.param.name); });
 
-TEST(OperationLogOfATokenlessAnswer, SaysNothingOfASuccess) {
+TEST(OperationLogOfAResponseWithoutToken, DoesNotReportSuccess) {
   const Testing::FixedEnvironment environment;
   const RecordedLog log;
   const auto transport = std::make_shared<Testing::TransportStandIn>([](const Request &) { return "issued:"; });
@@ -220,7 +220,7 @@ TEST(OperationLogOfATokenlessAnswer, SaysNothingOfASuccess) {
             FrameOf("AcquireTokenByCertificate", {{std::string("Requested token with spec `") + SPEC_TEXT + "'"}}));
 }
 
-TEST(OperationLogOfAVerdict, TellsThatATokenIsNotValid) {
+TEST(OperationLogOfAVerdict, ReportsThatATokenIsNotValid) {
   const Testing::FixedEnvironment environment;
   const RecordedLog log;
   const auto transport = std::make_shared<Testing::TransportStandIn>([](const Request &) { return "valid:false"; });
@@ -230,7 +230,7 @@ TEST(OperationLogOfAVerdict, TellsThatATokenIsNotValid) {
                                   {"Result: false"}}));
 }
 
-TEST(OperationFrame, GivesEachOperationAnIdentifierOfItsOwn) {
+TEST(OperationFrame, GivesEachOperationANewIdentifier) {
   const RecordedLog log;
   const auto transport = std::make_shared<Testing::TransportStandIn>([](const Request &) { return "issued:"; });
   const auto service = Testing::ServiceOn(transport);

@@ -32,7 +32,7 @@ std::string TokenXml(const std::string &name) {
   return Testing::ReadDataFile("tokens/" + name + ".xml");
 }
 
-/// An operation that yields a token, with the request that its builder call makes and the form of its response.
+/// An operation that returns a token, its request, and how its response begins.
 struct TokenOperation {
   const char *name;
   const char *request;
@@ -74,7 +74,7 @@ struct AnsweringService {
 
 class EachTokenOperation : public testing::TestWithParam<TokenOperation> {};
 
-TEST_P(EachTokenOperation, SendsItsRequestOnASessionOfItsOwnAndReturnsTheVerifiedToken) {
+TEST_P(EachTokenOperation, SendsItsRequestInANewSessionAndReturnsTheVerifiedToken) {
   const AnsweringService answering(GetParam().responseBegin + TokenXml("bearer"));
   const TokenPtr token = GetParam().run(*answering.service);
   ASSERT_NE(token, nullptr);
@@ -96,25 +96,25 @@ TEST_P(EachTokenOperation, ReportsAnExpiredTokenAsSsoException) {
                         "The token has expired at: 2021-01-01T00:00:00.000Z");
 }
 
-TEST_P(EachTokenOperation, LetsAWrongSignaturePassAsItIs) {
+TEST_P(EachTokenOperation, PassesOnTheExceptionOfAWrongSignature) {
   const AnsweringService answering(GetParam().responseBegin + TokenXml("signed-by-other"));
   EXPECT_THROWS_MESSAGE(GetParam().run(*answering.service), InvalidSignatureException,
                         "Failed to verify signature: token might have been tampered with.");
 }
 
-TEST_P(EachTokenOperation, LetsTheRefusalOfTextThatIsNotXmlPassAsItIs) {
+TEST_P(EachTokenOperation, PassesOnTheExceptionOfTextThatIsNotXml) {
   const AnsweringService answering(std::string(GetParam().responseBegin) + "no XML");
   EXPECT_THROWS_MESSAGE(GetParam().run(*answering.service), Tarvel::Xml::XMLParseException,
                         "text comes before the document element at line 1, column 1");
 }
 
-TEST_P(EachTokenOperation, LetsARefusalOfTheServicePassAsItIs) {
+TEST_P(EachTokenOperation, PassesOnARefusalOfTheService) {
   const AnsweringService answering("fault:Authentication failed");
   EXPECT_THROWS_MESSAGE(GetParam().run(*answering.service), InvalidCredentialsException, "Authentication failed");
   EXPECT_EQ(answering.transport->CountOpenSessions(), 0);
 }
 
-TEST_P(EachTokenOperation, LetsAFailureOfTheTransportPassAsItIs) {
+TEST_P(EachTokenOperation, PassesOnAFailureOfTheTransport) {
   const auto transport = std::make_shared<TransportStandIn>(
       [](const Request &) -> std::string { throw CommunicationException("Server returned error: 503 Busy"); });
   EXPECT_THROWS_MESSAGE(GetParam().run(*ServiceOn(transport)), CommunicationException,
@@ -127,7 +127,7 @@ INSTANTIATE_TEST_SUITE_P(SecurityTokenServiceImpl, EachTokenOperation, testing::
 
 class EachTokenOperationButGss : public EachTokenOperation {};
 
-TEST_P(EachTokenOperationButGss, YieldsNullWhenTheResponseHoldsNoToken) {
+TEST_P(EachTokenOperationButGss, ReturnsNullWhenTheResponseContainsNoToken) {
   const AnsweringService answering(GetParam().responseBegin);
   EXPECT_EQ(GetParam().run(*answering.service), nullptr);
 }
@@ -165,7 +165,7 @@ TEST(ValidateSubject, ReleasesItsSessionBeforeTheResponseIsRead) {
   EXPECT_EQ(openSessions, 0);
 }
 
-TEST(ValidateSubject, LetsARefusalPassAsItIs) {
+TEST(ValidateSubject, PassesOnARefusalOfTheService) {
   const AnsweringService answering("fault:Authentication failed");
   EXPECT_THROWS_MESSAGE(answering.service->ValidateSubject(CountingToken()), InvalidCredentialsException,
                         "Authentication failed");
@@ -184,7 +184,7 @@ TEST(SecurityTokenServiceImpl, SharesItsCollaboratorsWithItsCopies) {
   EXPECT_EQ(answering.transport->Sent(), std::vector<std::string>{"1: Certificate 5"});
 }
 
-TEST(SecurityTokenServiceImpl, AcceptsNoTokenWithoutTrustedCertificates) {
+TEST(SecurityTokenServiceImpl, RefusesEveryTokenWithoutTrustedCertificates) {
   const auto transport =
       std::make_shared<TransportStandIn>([](const Request &) { return "issued:" + TokenXml("bearer"); });
   const SecurityTokenServiceImpl service(std::make_shared<const Testing::RequestBuilderStandIn>(), transport,

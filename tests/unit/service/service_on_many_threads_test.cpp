@@ -26,8 +26,8 @@ namespace {
 
 using Testing::OperationsInTurn;
 
-/// How much more may be allocated at the end: OpenSSL keeps a little, made when first used. A leak of one byte in each of
-/// 20,000 operations would be more.
+/// How many more bytes may be allocated at the end: OpenSSL allocates a few on first use. A leak of one byte in each of
+/// 20,000 operations would exceed it.
 constexpr std::size_t MOST_BYTES_OF_GROWTH = 16384;
 
 /// Answers each request at once and keeps nothing of it.
@@ -67,9 +67,9 @@ private:
   mutable std::atomic<int> m_openSessions{0};
 };
 
-/// Expects `count` operations to succeed and to leave nothing behind.
+/// Expects `count` operations to succeed and not to leak.
 void ExpectNoErrorAndNoGrowth(int count, OperationsInTurn &operations, const ForgetfulTransport &transport) {
-  constexpr int FIRST = 320; // after which whatever is made once is there
+  constexpr int FIRST = 320; // after these, everything that is made once exists
   operations.RunOnSixteenThreads(FIRST);
   ASSERT_EQ(operations.GetFailure(), "");
   const std::size_t bytes = Testing::CountAllocatedBytes();

@@ -15,7 +15,7 @@ using Testing::SlotOf;
 
 static_assert(!std::has_virtual_destructor_v<SecurityTokenService>);
 
-TEST(SecurityTokenService, HasItsOperationsInOneOrder) {
+TEST(SecurityTokenService, HasItsOperationsInTheDeclaredOrder) {
   EXPECT_EQ(SlotOf(&SecurityTokenService::AcquireToken), 1);
   EXPECT_EQ(SlotOf(&SecurityTokenService::AcquireTokenByGSS), 2);
   EXPECT_EQ(SlotOf(&SecurityTokenService::AcquireTokenByCertificate), 3);
@@ -30,7 +30,7 @@ TEST(SecurityTokenService, HasItsOperationsInOneOrder) {
   EXPECT_EQ(SlotOf(&SecurityTokenService::RenewTokenAsync), 12);
 }
 
-TEST(SlotOf, IsNoneForAFunctionThatIsNotVirtual) {
+TEST(SlotOf, IsZeroForAFunctionThatIsNotVirtual) {
   struct Plain {
     void Run() {}
   };

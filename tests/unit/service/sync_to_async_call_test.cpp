@@ -22,7 +22,7 @@ namespace {
 
 using TokenPtr = std::shared_ptr<const SamlToken>;
 
-TEST(SyncCallToResultFunc, HandsTheResultOverWithoutAnException) {
+TEST(SyncCallToResultFunc, ReportsTheResultAndNoException) {
   const TokenPtr token = std::make_shared<Testing::CountingToken>();
   int calls = 0;
   SyncCallToResultFunc([&] { return token; },
@@ -35,7 +35,7 @@ TEST(SyncCallToResultFunc, HandsTheResultOverWithoutAnException) {
   EXPECT_EQ(calls, 1);
 }
 
-TEST(SyncCallToResultFunc, HandsTheCaughtExceptionItselfOverWithTheFailureValue) {
+TEST(SyncCallToResultFunc, ReportsTheCaughtExceptionItselfWithTheFailureValue) {
   int calls = 0;
   SyncCallToResultFunc([]() -> bool { throw ParseException("refused"); },
                        [&](const boost::optional<bool> &result, const Tarvel::Exception *failure) {
@@ -48,7 +48,7 @@ TEST(SyncCallToResultFunc, HandsTheCaughtExceptionItselfOverWithTheFailureValue)
   EXPECT_EQ(calls, 1);
 }
 
-TEST(SyncCallToResultFunc, LetsAnExceptionOfAnotherKindPassWithoutCallingBack) {
+TEST(SyncCallToResultFunc, PassesOnAnExceptionOfAnotherKindWithoutCallingBack) {
   int calls = 0;
   const auto count = [&](const boost::optional<bool> &, const Tarvel::Exception *) { ++calls; };
   EXPECT_THROWS_MESSAGE(
@@ -58,7 +58,7 @@ TEST(SyncCallToResultFunc, LetsAnExceptionOfAnotherKindPassWithoutCallingBack) {
   EXPECT_EQ(calls, 0);
 }
 
-TEST(SyncCallToResultFunc, LetsAnExceptionOfTheCallbackPassAndCallsItNoSecondTime) {
+TEST(SyncCallToResultFunc, PassesOnAnExceptionOfTheCallbackAndDoesNotCallItAgain) {
   int calls = 0;
   const auto throwing = [&](const boost::optional<bool> &, const Tarvel::Exception *) {
     ++calls;
@@ -73,7 +73,7 @@ TEST(SyncCallToResultFunc, LetsAnExceptionOfTheCallbackPassAndCallsItNoSecondTim
   EXPECT_EQ(calls, 2);
 }
 
-TEST(SyncToAsyncCall, LetsTheBadFunctionCallOfAnEmptyCallLeaveThePoolsItem) {
+TEST(SyncToAsyncCall, EndsTheWorkItemWithTheExceptionOfAnEmptyCall) {
   const Testing::RecordedLog log;
   SyncToAsyncCall(std::function<TokenPtr()>(),
                   [](const TokenPtr &, const Tarvel::Exception *) { ADD_FAILURE() << "called back"; });
@@ -82,7 +82,7 @@ TEST(SyncToAsyncCall, LetsTheBadFunctionCallOfAnEmptyCallLeaveThePoolsItem) {
                                                   "std::bad_function_call: bad_function_call"});
 }
 
-TEST(PassByRefHelper, YieldsTheVeryObjectAndKeepsItAlive) {
+TEST(PassByRefHelper, RefersToTheObjectItselfAndKeepsItAlive) {
   auto number = std::make_shared<int>(5);
   const std::weak_ptr<int> watched = number;
   {
@@ -94,7 +94,7 @@ TEST(PassByRefHelper, YieldsTheVeryObjectAndKeepsItAlive) {
   EXPECT_TRUE(watched.expired());
 }
 
-TEST(PassByRefHelper, RefusesToYieldAnObjectThatIsNotThere) {
+TEST(PassByRefHelper, ThrowsWhenThereIsNoObject) {
   const PassByRefHelper<int> helper(nullptr);
   EXPECT_THROWS_MESSAGE(static_cast<void>(static_cast<int &>(helper)), Tarvel::InvalidArgumentException,
                         "Invalid argument : a required object may not be NULL");

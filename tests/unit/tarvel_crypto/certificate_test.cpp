@@ -62,7 +62,7 @@ private:
   std::string m_path = ::testing::TempDir() + "tarvel_crypto_XXXXXX";
 };
 
-TEST(Certificate, TellsItsNamesAsRfc2253Does) {
+TEST(Certificate, ReportsItsNamesInTheFormOfRfc2253) {
   const auto certificate = FixtureCertificate("rsa2048");
   EXPECT_EQ(certificate->GetSubject(), "CN=rsa2048,O=Example");
   EXPECT_EQ(certificate->GetIssuer(), "CN=rsa2048,O=Example");
@@ -72,11 +72,11 @@ TEST(Certificate, EscapesSpecialCharactersInNamesAndKeepsUtf8) {
   EXPECT_EQ(FixtureCertificate("names")->GetSubject(), "CN=Zoë \\+ \\\"Ω\\\",O=Exämple\\, Inc.");
 }
 
-TEST(Certificate, TellsItsThumbprintAsOpensslDoes) {
+TEST(Certificate, ReportsTheSameThumbprintAsOpenssl) {
   EXPECT_EQ(FixtureCertificate("rsa2048")->GetSha256Thumbprint(), ReadFixture("rsa2048.sha256"));
 }
 
-TEST(Certificate, TellsItsValidity) {
+TEST(Certificate, ReportsItsValidity) {
   const auto certificate = FixtureCertificate("p256");
   EXPECT_EQ(certificate->GetNotBefore(), System::DateTime("2020-01-02T03:04:05Z"));
   EXPECT_EQ(certificate->GetNotAfter(), System::DateTime("2120-01-02T03:04:05Z"));
@@ -94,7 +94,7 @@ TEST(Certificate, WritesItselfAsPem) {
   EXPECT_EQ(certificate->ToPem(), ReadFixture("rsa2048.crt"));
 }
 
-TEST(Certificate, OfAnotherKeyKindStillDecodes) {
+TEST(Certificate, DecodesWithAnotherKindOfKey) {
   EXPECT_EQ(FixtureCertificate("ed25519")->GetSubject(), "CN=ed25519,O=Example");
 }
 
@@ -106,19 +106,19 @@ TEST(CreateCertificateFromDer, RefusesEveryPrefix) {
   EXPECT_EQ(ERR_peek_error(), 0U);
 }
 
-TEST(CreateCertificateFromDer, RefusesNoBytes) {
+TEST(CreateCertificateFromDer, RefusesEmptyInput) {
   EXPECT_THROWS_MESSAGE(CreateCertificateFromDer(nullptr, 0), CryptoException,
                         "Certificate of 0 bytes does not decode");
 }
 
-TEST(CreateCertificateFromDer, RefusesBytesBehindTheCertificate) {
+TEST(CreateCertificateFromDer, RefusesBytesAfterTheCertificate) {
   EXPECT_THROWS_MESSAGE(DecodeCertificate(ReadFixture("rsa2048.crt.der") + "xy"), CryptoException,
                         "Certificate is followed by 2 further bytes");
 }
 
 TEST(CreateCertificateFromDer, RefusesAnEncodingThatIsOnlyBer) {
   std::string der = ReadFixture("rsa2048.crt.der");
-  // 30 82 hi lo ... becomes 30 83 00 hi lo ...: the same length, written longer than it must be.
+  // 30 82 hi lo ... becomes 30 83 00 hi lo ...: the same length in a longer encoding than necessary.
   ASSERT_EQ(der.substr(0, 2), "\x30\x82");
   der[1] = '\x83';
   der.insert(2, 1, '\0');
@@ -137,7 +137,7 @@ TEST(CreateCertificateFromDer, RefusesBerInsideTheSignedPart) {
                         "Certificate is not in the distinguished encoding (DER)");
 }
 
-TEST(CreateCertificateFromDer, EndsInItsExceptionOrACertificateForEveryChangedByte) {
+TEST(CreateCertificateFromDer, DecodesOrThrowsItsExceptionForEveryChangedByte) {
   const std::string der = ReadFixture("p256.crt.der");
   int refused = 0;
   for (std::size_t at = 0; at < der.size(); ++at) {
@@ -166,7 +166,7 @@ TEST(CreateCertificateFromPem, TakesTheFirstOfSeveral) {
   EXPECT_EQ(CreateCertificateFromPem(ReadFixture("bundle.pem"))->GetSubject(), "CN=rsa2048,O=Example");
 }
 
-TEST(CreateCertificateFromPem, KeepsOpensslsWordsForWhatIsWrong) {
+TEST(CreateCertificateFromPem, IncludesTheTextOfOpensslInItsMessage) {
   std::string pem = ReadFixture("rsa2048.crt");
   pem[40] = '*';
   const std::string message = CryptoMessage([&] { CreateCertificateFromPem(pem); });
@@ -174,7 +174,7 @@ TEST(CreateCertificateFromPem, KeepsOpensslsWordsForWhatIsWrong) {
   EXPECT_THAT(message, HasSubstr("bad base64 decode"));
 }
 
-TEST(CreateCertificatesFromPem, GivesAllInOrderAndSkipsTextBetween) {
+TEST(CreateCertificatesFromPem, ReturnsAllInOrderAndSkipsTheTextBetween) {
   const CertificateList certificates = CreateCertificatesFromPem(ReadFixture("bundle.pem"));
   EXPECT_THAT(SubjectsOf(certificates),
               ElementsAre("CN=rsa2048,O=Example", "CN=p256,O=Example", "CN=rsa3072,O=Example"));
@@ -187,7 +187,7 @@ TEST(CreateCertificatesFromPem, RefusesTextWithAPrivateKey) {
                         "Holds a private key (RSA PRIVATE KEY) where only certificates belong");
 }
 
-TEST(CreateCertificatesFromPem, NeverLosesACertificateOfACutBundle) {
+TEST(CreateCertificatesFromPem, NeverLosesACertificateOfATruncatedBundle) {
   const std::string bundle = ReadFixture("bundle.pem");
   const std::string mark = "-----END CERTIFICATE-----";
   for (std::size_t length = 0; length < bundle.size(); ++length) {
@@ -215,7 +215,7 @@ TEST(LoadCertificates, NamesTheFileThatCannotBeRead) {
                         "Cannot open /nowhere/trust.pem: No such file or directory");
 }
 
-TEST(LoadCertificates, NamesTheFileThatHoldsAKey) {
+TEST(LoadCertificates, NamesTheFileThatContainsAKey) {
   const std::string pem = FixturePath("bundle-with-key.pem");
   EXPECT_THROWS_MESSAGE(LoadCertificates(pem), CryptoException,
                         pem + ": Holds a private key (PRIVATE KEY) where only certificates belong");

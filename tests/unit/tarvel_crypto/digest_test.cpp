@@ -41,23 +41,23 @@ TEST(Digest, AgreesWithTheExamplesOfTheStandard) {
             "2192992a274fc1a836ba3c23a3feebbd454d4423643ce80e2a9ac94fa54ca49f");
 }
 
-TEST(Digest, OfNothing) {
+TEST(Digest, AgreesWithTheStandardForTheEmptyMessage) {
   EXPECT_EQ(DigestInHex(DigestAlgorithm::SHA256, {}),
             "e3b0c44298fc1c149afbf4c8996fb92427ae41e4649b934ca495991b7852b855");
 }
 
-TEST(Digest, DoesNotDependOnThePieces) {
+TEST(Digest, DoesNotDependOnHowTheMessageIsSplit) {
   EXPECT_EQ(DigestInHex(DigestAlgorithm::SHA256, {"a", "", "bc"}), DigestInHex(DigestAlgorithm::SHA256, {"abc"}));
 }
 
 constexpr const char *SHA256_OF_ABC = "ba7816bf8f01cfea414140de5dae2223b00361a396177a9cb410ff61f20015ad";
 
-TEST(Digest, DoesNotDependOnAnEarlierOneThatWasFinished) {
+TEST(Digest, DoesNotDependOnAnEarlierFinishedDigest) {
   DigestInHex(DigestAlgorithm::SHA256, {std::string(200, 'x')});
   EXPECT_EQ(DigestInHex(DigestAlgorithm::SHA256, {"abc"}), SHA256_OF_ABC);
 }
 
-TEST(Digest, DoesNotDependOnAnEarlierOneThatWasGivenUp) {
+TEST(Digest, DoesNotDependOnAnEarlierAbandonedDigest) {
   {
     Digest digest(DigestAlgorithm::SHA256);
     digest.Update("x");
@@ -65,7 +65,7 @@ TEST(Digest, DoesNotDependOnAnEarlierOneThatWasGivenUp) {
   EXPECT_EQ(DigestInHex(DigestAlgorithm::SHA256, {"abc"}), SHA256_OF_ABC);
 }
 
-TEST(Digest, DoesNotDependOnAnotherThatIsUnderWay) {
+TEST(Digest, DoesNotDependOnAnotherDigestUnderWay) {
   Digest outer(DigestAlgorithm::SHA256);
   outer.Update("a");
   EXPECT_EQ(DigestInHex(DigestAlgorithm::SHA256, {"abc"}), SHA256_OF_ABC);
@@ -76,7 +76,7 @@ TEST(Digest, DoesNotDependOnAnotherThatIsUnderWay) {
   EXPECT_EQ(value[31], 0xad);
 }
 
-TEST(Digest, IsRightOnManyThreads) {
+TEST(Digest, IsCorrectOnManyThreads) {
   std::atomic<int> wrong{0};
   std::vector<std::thread> threads;
   for (int thread = 0; thread < 8; ++thread) {

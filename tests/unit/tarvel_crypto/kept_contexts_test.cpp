@@ -14,7 +14,7 @@ namespace Tarvel::Crypto {
 
 namespace {
 
-/// In place of a context: it knows whether somebody uses it, and whether it was freed.
+/// A substitute for a context, which records how many threads use it and whether it was freed.
 struct Context {
   std::atomic<int> users{0};
   bool freed = false;
@@ -27,13 +27,13 @@ struct MarkAsFreed {
 using Handle = std::unique_ptr<Context, MarkAsFreed>;
 using Contexts = KeptContexts<Handle, 2>;
 
-TEST(KeptContexts, HaveNothingAtFirst) {
+TEST(KeptContexts, AreEmptyAtFirst) {
   Contexts contexts;
   EXPECT_EQ(contexts.Acquire(0), nullptr);
   EXPECT_EQ(contexts.Acquire(1), nullptr);
 }
 
-TEST(KeptContexts, GiveEachContextOnce) {
+TEST(KeptContexts, HandOutEachContextOnce) {
   Contexts contexts;
   Context context;
   contexts.Return(1, Handle(&context));
@@ -42,7 +42,7 @@ TEST(KeptContexts, GiveEachContextOnce) {
   EXPECT_FALSE(context.freed);
 }
 
-TEST(KeptContexts, DoNotTakeOneKindForAnother) {
+TEST(KeptContexts, KeepTheKindsApart) {
   Contexts contexts;
   Context context;
   contexts.Return(1, Handle(&context));
@@ -50,16 +50,16 @@ TEST(KeptContexts, DoNotTakeOneKindForAnother) {
   EXPECT_EQ(contexts.Acquire(1).release(), &context);
 }
 
-TEST(KeptContexts, GiveTheContextOfAnotherThreadWhenThereIsNoneOfTheirOwn) {
+TEST(KeptContexts, HandOutTheContextOfAnotherThreadIfTheThreadHasNone) {
   Contexts contexts;
   Context context;
   std::thread([&] { contexts.Return(0, Handle(&context)); }).join();
   EXPECT_EQ(contexts.Acquire(0).release(), &context);
 }
 
-TEST(KeptContexts, FreeWhatThereIsNoRoomFor) {
+TEST(KeptContexts, FreeContextsBeyondTheirCapacity) {
   Contexts contexts;
-  std::vector<Context> many(5); // of one kind there is room for four
+  std::vector<Context> many(5); // four of one kind are kept
   for (Context &context : many) {
     contexts.Return(0, Handle(&context));
   }
@@ -67,7 +67,7 @@ TEST(KeptContexts, FreeWhatThereIsNoRoomFor) {
   EXPECT_TRUE(many[4].freed);
 }
 
-TEST(KeptContexts, FreeAllFreesWhatIsKept) {
+TEST(KeptContexts, FreeAllKeptContexts) {
   Contexts contexts;
   std::vector<Context> many(4);
   for (std::size_t index = 0; index < many.size(); ++index) {
@@ -80,10 +80,10 @@ TEST(KeptContexts, FreeAllFreesWhatIsKept) {
   EXPECT_EQ(contexts.Acquire(0), nullptr);
 }
 
-TEST(KeptContexts, GiveAContextToOneThreadAtATime) {
+TEST(KeptContexts, HandOutAContextToOneThreadAtATime) {
   constexpr int ROUNDS = 2000;
   Contexts contexts;
-  std::vector<Context> made(4); // as many as there is room for: none is ever freed
+  std::vector<Context> made(4); // as many as are kept, so none is ever freed
   for (Context &context : made) {
     contexts.Return(0, Handle(&context));
   }
@@ -94,7 +94,7 @@ TEST(KeptContexts, GiveAContextToOneThreadAtATime) {
       for (int round = 0; round < ROUNDS; ++round) {
         Handle context = contexts.Acquire(0);
         if (!context) {
-          continue; // others have them all
+          continue; // other threads have all of them
         }
         shared += context->users.fetch_add(1) == 0 ? 0 : 1;
         context->users.fetch_sub(1);

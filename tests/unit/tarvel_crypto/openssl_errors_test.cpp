@@ -32,7 +32,7 @@ protected:
   ~OpenSslErrorScopeTest() override { ERR_clear_error(); }
 };
 
-TEST_F(OpenSslErrorScopeTest, LeavesNothingBehind) {
+TEST_F(OpenSslErrorScopeTest, RemovesItsErrors) {
   {
     const OpenSslErrorScope errors;
     RaiseError(1, "ours");
@@ -67,7 +67,7 @@ TEST_F(OpenSslErrorScopeTest, KeepsAMarkOfTheHost) {
   EXPECT_EQ(ERR_GET_REASON(ERR_peek_last_error()), 1);
 }
 
-TEST_F(OpenSslErrorScopeTest, TellsEveryErrorOldestFirst) {
+TEST_F(OpenSslErrorScopeTest, DescribesEveryErrorOldestFirst) {
   const OpenSslErrorScope errors;
   RaiseError(1, "first");
   RaiseError(2, "second");
@@ -76,32 +76,32 @@ TEST_F(OpenSslErrorScopeTest, TellsEveryErrorOldestFirst) {
               AllOf(::testing::StartsWith("It failed: error:"), HasSubstr("(first); error:"), EndsWith("(second)")));
 }
 
-TEST_F(OpenSslErrorScopeTest, NeverTellsAnErrorOfTheHostAsOurs) {
+TEST_F(OpenSslErrorScopeTest, NeverDescribesAnErrorOfTheHost) {
   RaiseError(1, "of the host");
   const OpenSslErrorScope errors;
   RaiseError(2, "ours");
   EXPECT_THAT(errors.TakeText(), AllOf(HasSubstr("ours"), Not(HasSubstr("of the host"))));
 }
 
-TEST_F(OpenSslErrorScopeTest, HasNoTextWithoutAnError) {
+TEST_F(OpenSslErrorScopeTest, AddsNoTextWithoutAnError) {
   const OpenSslErrorScope errors;
   EXPECT_EQ(errors.Describe("It failed"), "It failed");
 }
 
-TEST_F(OpenSslErrorScopeTest, HasNoTextWhenOnlyTheHostHasAnError) {
+TEST_F(OpenSslErrorScopeTest, AddsNoTextWhenOnlyTheHostHasAnError) {
   RaiseError(1, "of the host");
   const OpenSslErrorScope errors;
   EXPECT_EQ(errors.Describe("It failed"), "It failed");
 }
 
-TEST_F(OpenSslErrorScopeTest, KnowsALackOfMemoryByAnyErrorOfTheQueue) {
+TEST_F(OpenSslErrorScopeTest, RecognisesALackOfMemoryByAnyQueuedError) {
   const OpenSslErrorScope errors;
   ERR_raise(ERR_LIB_ASN1, ERR_R_MALLOC_FAILURE);
   RaiseError(1, "and so it does not decode");
   EXPECT_THROWS_MESSAGE(errors.Throw("It failed"), OutOfMemoryException, "There is not enough memory");
 }
 
-TEST_F(OpenSslErrorScopeTest, KnowsALackOfMemoryByTheSystemWhenOpenSslReportsSomethingElse) {
+TEST_F(OpenSslErrorScopeTest, RecognisesALackOfMemoryByErrnoWhenOpenSslReportsAnotherError) {
   errno = ENOMEM; // of the host
   const OpenSslErrorScope errors;
   RaiseError(1, "it does not decode");
@@ -110,7 +110,7 @@ TEST_F(OpenSslErrorScopeTest, KnowsALackOfMemoryByTheSystemWhenOpenSslReportsSom
   EXPECT_THROWS_MESSAGE(errors.Describe("It failed"), OutOfMemoryException, "There is not enough memory");
 }
 
-TEST_F(OpenSslErrorScopeTest, KnowsALackOfMemoryOfAScopeWithinIt) {
+TEST_F(OpenSslErrorScopeTest, RecognisesALackOfMemoryInAnInnerScope) {
   const OpenSslErrorScope errors;
   {
     const OpenSslErrorScope inner;
@@ -123,7 +123,7 @@ TEST_F(OpenSslErrorScopeTest, KnowsALackOfMemoryOfAScopeWithinIt) {
   EXPECT_TRUE(errors.RanOutOfMemory());
 }
 
-TEST_F(OpenSslErrorScopeTest, KeepsTheSystemsErrorOfTheHost) {
+TEST_F(OpenSslErrorScopeTest, KeepsErrnoOfTheHost) {
   errno = EAGAIN;
   {
     const OpenSslErrorScope errors;
@@ -132,7 +132,7 @@ TEST_F(OpenSslErrorScopeTest, KeepsTheSystemsErrorOfTheHost) {
   EXPECT_EQ(errno, EAGAIN);
 }
 
-TEST_F(OpenSslErrorScopeTest, HasItsTextAlsoAfterMemoryWasAskedFor) {
+TEST_F(OpenSslErrorScopeTest, KeepsItsTextAfterACheckForMemory) {
   const OpenSslErrorScope errors;
   RaiseError(1, "ours");
   EXPECT_FALSE(errors.RanOutOfMemory());

@@ -1,5 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
-// Keys and certificates on threads that nobody joins, while the process ends.
+// Keys and certificates in use on detached threads while the process ends.
 
 #include "crypto/openssl_guard.h"
 
@@ -74,7 +74,7 @@ void EndWhileBusy() {
   std::exit(0);
 }
 
-TEST(OpenSslGuardDeathTest, TheProcessMayEndWhileSignaturesAreMadeAndChecked) {
+TEST(OpenSslGuardDeathTest, LetsTheProcessEndWhileSignaturesAreMadeAndChecked) {
   testing::FLAGS_gtest_death_test_style = "threadsafe";
   for (int i = 0; i < 5; ++i) {
     ASSERT_EXIT(EndWhileBusy(), testing::ExitedWithCode(0), "") << i;
@@ -84,7 +84,7 @@ TEST(OpenSslGuardDeathTest, TheProcessMayEndWhileSignaturesAreMadeAndChecked) {
 void ReportRefusal(const char *name, const std::function<void()> &use) {
   try {
     use();
-    std::cerr << name << " went on\n";
+    std::cerr << name << " was not refused\n";
   } catch (const InvalidStateException &refusal) {
     std::cerr << name << ": " << refusal.what() << "\n";
   }
@@ -111,11 +111,11 @@ void UseAfterCleanUp() {
   std::_Exit(0);
 }
 
-TEST(Passphrase, IsAskedForInAPauseOfTheUse) {
+TEST(Passphrase, SuspendsTheGuardWhileItAsksTheHost) {
   OpenSslGuard::Prepare();
   OpenSslGuard guard;
   const PassphraseCallback ask = [&guard] {
-    EXPECT_FALSE(guard); // so that nobody waits for who types
+    EXPECT_FALSE(guard); // so that a clean-up does not wait for the user
     return std::string("x");
   };
   Passphrase passphrase(ask, guard);
@@ -123,7 +123,7 @@ TEST(Passphrase, IsAskedForInAPauseOfTheUse) {
   EXPECT_TRUE(guard);
 }
 
-TEST(Passphrase, IsFollowedByTheUseAlsoWhenTheHostThrows) {
+TEST(Passphrase, ResumesTheGuardWhenTheHostThrows) {
   OpenSslGuard::Prepare();
   OpenSslGuard guard;
   const PassphraseCallback ask = []() -> std::string { throw InvalidArgumentException("no"); };
@@ -135,20 +135,20 @@ TEST(Passphrase, IsFollowedByTheUseAlsoWhenTheHostThrows) {
 void CleanUpWhileThePassphraseIsAskedFor() {
   ReportRefusal("key", [] {
     CreatePrivateKey(Testing::ReadFixture("p256-encrypted.key"), [] {
-      OPENSSL_cleanup(); // which would wait for a use that was going on
+      OPENSSL_cleanup(); // would wait for a use under way
       return Testing::PASSPHRASE;
     });
   });
   std::_Exit(0);
 }
 
-TEST(OpenSslGuardDeathTest, IsRefusedWhenOpenSslCleanedItselfUpWhileThePassphraseWasAskedFor) {
+TEST(OpenSslGuardDeathTest, RefusesUseAfterACleanUpDuringThePassphraseCallback) {
   testing::FLAGS_gtest_death_test_style = "threadsafe";
   EXPECT_EXIT(CleanUpWhileThePassphraseIsAskedFor(), testing::ExitedWithCode(0),
               "^key: OpenSSL has cleaned itself up: the process is about to end\n$");
 }
 
-TEST(OpenSslGuardDeathTest, IsRefusedOnceOpenSslHasCleanedItselfUp) {
+TEST(OpenSslGuardDeathTest, RefusesEveryUseAfterTheCleanUp) {
   testing::FLAGS_gtest_death_test_style = "threadsafe";
   const char *const reason = ": OpenSSL has cleaned itself up: the process is about to end\n";
   std::string expected = "^";

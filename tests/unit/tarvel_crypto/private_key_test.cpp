@@ -63,9 +63,9 @@ void PrintTo(const KeyForm &form, std::ostream *out) {
   *out << form.file;
 }
 
-class PrivateKeyForms : public ::testing::TestWithParam<KeyForm> {};
+class CreatePrivateKeyTest : public ::testing::TestWithParam<KeyForm> {};
 
-TEST_P(PrivateKeyForms, DecodesAndAsksForThePassphraseOnlyWhenItNeedsOneAndOnce) {
+TEST_P(CreatePrivateKeyTest, DecodesEachFormAndAsksOnceForThePassphraseIfEncrypted) {
   int asked = 0;
   const auto key = CreatePrivateKey(ReadFixture(GetParam().file), [&asked] {
     ++asked;
@@ -76,7 +76,7 @@ TEST_P(PrivateKeyForms, DecodesAndAsksForThePassphraseOnlyWhenItNeedsOneAndOnce)
   EXPECT_EQ(ERR_peek_error(), 0U);
 }
 
-TEST_P(PrivateKeyForms, LoadsFromAFileOrAFileUri) {
+TEST_P(CreatePrivateKeyTest, LoadsFromAFileOrAFileUri) {
   const std::string path = FixturePath(GetParam().file);
   const auto fromFile = LoadPrivateKey(path, GivePassphrase);
   RequireKeyMatchesCertificate(*fromFile, *FixtureCertificate(GetParam().certificate));
@@ -84,7 +84,7 @@ TEST_P(PrivateKeyForms, LoadsFromAFileOrAFileUri) {
   RequireKeyMatchesCertificate(*fromUri, *FixtureCertificate(GetParam().certificate));
 }
 
-TEST_P(PrivateKeyForms, RefusesAWrongOrMissingPassphraseWhenEncrypted) {
+TEST_P(CreatePrivateKeyTest, RefusesAWrongOrMissingPassphraseWhenEncrypted) {
   if (!GetParam().encrypted) {
     EXPECT_TRUE(CreatePrivateKey(ReadFixture(GetParam().file)));
     return;
@@ -97,7 +97,7 @@ TEST_P(PrivateKeyForms, RefusesAWrongOrMissingPassphraseWhenEncrypted) {
   EXPECT_EQ(ERR_peek_error(), 0U);
 }
 
-TEST_P(PrivateKeyForms, RefusesEveryFourthPrefix) {
+TEST_P(CreatePrivateKeyTest, RefusesEveryFourthPrefix) {
   std::string text = ReadFixture(GetParam().file);
   while (text.ends_with('\n')) {
     text.pop_back();
@@ -109,7 +109,7 @@ TEST_P(PrivateKeyForms, RefusesEveryFourthPrefix) {
 }
 
 INSTANTIATE_TEST_SUITE_P(
-    All, PrivateKeyForms,
+    All, CreatePrivateKeyTest,
     ::testing::Values(
         KeyForm{"rsa2048.key", "rsa2048", false}, KeyForm{"rsa2048.key.der", "rsa2048", false},
         KeyForm{"rsa2048-traditional.key", "rsa2048", false}, KeyForm{"rsa2048-traditional.key.der", "rsa2048", false},
@@ -122,7 +122,7 @@ INSTANTIATE_TEST_SUITE_P(
         KeyForm{"certificate-then-key.pem", "rsa2048", false}),
     [](const auto &form) { return Testing::TestName(form.param.file); });
 
-TEST(PrivateKey, TellsItsAlgorithmAndSize) {
+TEST(PrivateKey, ReportsItsAlgorithmAndSize) {
   EXPECT_EQ(FixtureKey("rsa3072")->GetAlgorithm(), "RSA");
   EXPECT_EQ(FixtureKey("rsa3072")->GetBits(), 3072U);
   EXPECT_EQ(FixtureKey("p521")->GetAlgorithm(), "EC");
@@ -142,7 +142,7 @@ TEST(CreatePrivateKey, RefusesAnotherAlgorithm) {
                         "Private key of algorithm ED25519, which is neither RSA nor EC");
 }
 
-TEST(CreatePrivateKey, RefusesBytesBehindTheKey) {
+TEST(CreatePrivateKey, RefusesBytesAfterTheKey) {
   for (const char *file : {"rsa2048.key.der", "rsa2048-traditional.key.der", "rsa2048-encrypted.key.der"}) {
     const std::string der = ReadFixture(file) + "x";
     EXPECT_THAT(MessageOf<CryptoException>([&] { CreatePrivateKey(der, GivePassphrase); }),
@@ -151,7 +151,7 @@ TEST(CreatePrivateKey, RefusesBytesBehindTheKey) {
   }
 }
 
-TEST(CreatePrivateKey, DoesNotCallACipherThatIsNotOfferedAWrongPassphrase) {
+TEST(CreatePrivateKey, DoesNotReportAnUnavailableCipherAsAWrongPassphrase) {
   const std::string text = ReadFixture("rsa2048-des.key");
   EXPECT_THAT(MessageOf<CryptoException>([&] { CreatePrivateKey(text, GivePassphrase); }),
               StartsWith("The private key cannot be decrypted: error:"));
@@ -162,7 +162,7 @@ TEST(CreatePrivateKey, RefusesAPassphraseLongerThanOpensslTakes) {
   MessageOf<WrongPassphraseException>([&] { CreatePrivateKey(text, [] { return std::string(1 << 16, 'x'); }); });
 }
 
-TEST(CreatePrivateKey, LetsTheExceptionOfThePassphraseCallbackThrough) {
+TEST(CreatePrivateKey, PassesOnTheExceptionOfThePassphraseCallback) {
   const std::string text = ReadFixture("rsa2048-encrypted.key");
   const auto fail = []() -> std::string { throw InvalidStateException("no terminal"); };
   EXPECT_THROWS_MESSAGE(CreatePrivateKey(text, fail), InvalidStateException, "no terminal");
@@ -199,7 +199,7 @@ TEST(LoadPrivateKey, RefusesAStoreWithoutAKey) {
   EXPECT_THROWS_MESSAGE(LoadPrivateKey(uri), NoKeyException, uri + ": There is no private key in the store");
 }
 
-TEST(LoadPrivateKey, RefusesAStoreThatIsNotThere) {
+TEST(LoadPrivateKey, RefusesAStoreThatDoesNotExist) {
   EXPECT_THAT(MessageOf<IOException>([] { LoadPrivateKey("file:/nowhere/client.key"); }),
               StartsWith("file:/nowhere/client.key: The key store cannot be read: "));
 }
@@ -211,11 +211,11 @@ TEST(LoadPrivateKey, RefusesASchemeWithoutALoader) {
   EXPECT_EQ(ERR_peek_error(), 0U);
 }
 
-TEST(LoadPrivateKey, TakesAPathWithAColonBehindASlashForAFile) {
+TEST(LoadPrivateKey, TreatsAPathWithAColonAfterASlashAsAFile) {
   EXPECT_THROWS_MESSAGE(LoadPrivateKey("./key:1"), IOException, "Cannot open ./key:1: No such file or directory");
 }
 
-TEST(CreateKeyStoreFromPkcs12, GivesKeyCertificateAndTheOthers) {
+TEST(CreateKeyStoreFromPkcs12, ReturnsTheKeyItsCertificateAndTheOtherCertificates) {
   const KeyStore store = CreateKeyStoreFromPkcs12(ReadFixture("rsa2048.p12"), GivePassphrase);
   RequireKeyMatchesCertificate(*store.privateKey, *store.certificate);
   EXPECT_EQ(store.certificate->GetSubject(), "CN=rsa2048,O=Example");
@@ -245,7 +245,7 @@ TEST(CreateKeyStoreFromPkcs12, RefusesAStoreWithoutAKeyOrWithoutACertificate) {
                         "There is no certificate for the private key in the PKCS#12 key store");
 }
 
-TEST(CreateKeyStoreFromPkcs12, RefusesPrefixesAndBytesBehind) {
+TEST(CreateKeyStoreFromPkcs12, RefusesEveryPrefixAndBytesAfterTheStore) {
   const std::string der = ReadFixture("p256.p12");
   for (std::size_t length = 0; length < der.size(); ++length) {
     EXPECT_THROW(CreateKeyStoreFromPkcs12(der.substr(0, length), GivePassphrase), CryptoException) << length;
@@ -255,11 +255,11 @@ TEST(CreateKeyStoreFromPkcs12, RefusesPrefixesAndBytesBehind) {
   EXPECT_EQ(ERR_peek_error(), 0U);
 }
 
-TEST(LoadKeyStore, GivesWhatTheFileHolds) {
+TEST(LoadKeyStore, ReadsTheFile) {
   EXPECT_EQ(LoadKeyStore(FixturePath("rsa2048.p12"), GivePassphrase).privateKey->GetAlgorithm(), "RSA");
 }
 
-TEST(LoadKeyStore, NamesThePathInEachRefusal) {
+TEST(LoadKeyStore, IncludesThePathInEachMessage) {
   EXPECT_THROWS_MESSAGE(LoadKeyStore("/nowhere.p12", {}), Tarvel::IOException,
                         "Cannot open /nowhere.p12: No such file or directory");
   EXPECT_THROWS_MESSAGE(LoadKeyStore(FixturePath("certificate-only.p12"), GivePassphrase), NoKeyException,

@@ -48,7 +48,7 @@ bool VerifyMessage(const Certificate &certificate, SignatureScheme scheme, Diges
                       reinterpret_cast<const std::uint8_t *>(value.data()), value.size());
 }
 
-class SignatureValues : public ::testing::TestWithParam<SignedFixture> {
+class VerifyDigestTest : public ::testing::TestWithParam<SignedFixture> {
 protected:
   bool VerifyValue(const std::string &value) const {
     return VerifyMessage(*m_certificate, GetParam().scheme, GetParam().algorithm, value);
@@ -58,13 +58,13 @@ protected:
   const Ref<const Certificate> m_certificate = FixtureCertificate(GetParam().key);
 };
 
-TEST_P(SignatureValues, MadeByOpensslVerifyAgainAndAgain) {
+TEST_P(VerifyDigestTest, AcceptsAValueMadeByOpensslEachTime) {
   for (int round = 0; round < 3; ++round) {
     EXPECT_TRUE(VerifyValue(m_value));
   }
 }
 
-TEST_P(SignatureValues, WithAnyChangedByteAreFalseAndSpoilNothing) {
+TEST_P(VerifyDigestTest, RefusesAnyChangedByteAndThenStillAcceptsTheOriginal) {
   for (std::size_t at = 0; at < m_value.size(); ++at) {
     std::string changed = m_value;
     changed[at] = static_cast<char>(changed[at] ^ 1);
@@ -74,7 +74,7 @@ TEST_P(SignatureValues, WithAnyChangedByteAreFalseAndSpoilNothing) {
   EXPECT_EQ(ERR_peek_error(), 0U);
 }
 
-TEST_P(SignatureValues, OfAnotherLengthAreFalse) {
+TEST_P(VerifyDigestTest, RefusesAnotherLength) {
   for (std::size_t length = 0; length < m_value.size(); ++length) {
     EXPECT_FALSE(VerifyValue(m_value.substr(0, length))) << length << " bytes";
   }
@@ -83,20 +83,20 @@ TEST_P(SignatureValues, OfAnotherLengthAreFalse) {
   EXPECT_FALSE(VerifyValue(std::string(1 << 16, 'x')));
 }
 
-TEST_P(SignatureValues, OfExtremeNumbersAreFalse) {
+TEST_P(VerifyDigestTest, RefusesExtremeNumbers) {
   EXPECT_FALSE(VerifyValue(std::string(m_value.size(), '\0')));
   EXPECT_FALSE(VerifyValue(std::string(m_value.size(), '\xff')));
   EXPECT_EQ(ERR_peek_error(), 0U);
 }
 
-TEST_P(SignatureValues, OverAnotherDigestAreFalse) {
+TEST_P(VerifyDigestTest, RefusesAValueOverAnotherDigest) {
   DigestValue digest = DigestOf(GetParam().algorithm, ReadFixture("message.txt"));
   digest[0] ^= 1;
   EXPECT_FALSE(VerifyDigest(*m_certificate, GetParam().scheme, GetParam().algorithm, digest.data(),
                             reinterpret_cast<const std::uint8_t *>(m_value.data()), m_value.size()));
 }
 
-TEST_P(SignatureValues, AreFalseUnderEveryOtherSchemeAndDigestAlgorithm) {
+TEST_P(VerifyDigestTest, RefusesEveryOtherSchemeAndDigestAlgorithm) {
   for (const auto scheme : {SignatureScheme::RSA_PKCS1, SignatureScheme::RSA_PSS, SignatureScheme::ECDSA}) {
     for (const auto algorithm : {DigestAlgorithm::SHA256, DigestAlgorithm::SHA384, DigestAlgorithm::SHA512}) {
       const bool same = scheme == GetParam().scheme && algorithm == GetParam().algorithm;
@@ -105,7 +105,7 @@ TEST_P(SignatureValues, AreFalseUnderEveryOtherSchemeAndDigestAlgorithm) {
   }
 }
 
-TEST_P(SignatureValues, AreFalseForEveryOtherCertificate) {
+TEST_P(VerifyDigestTest, RefusesEveryOtherCertificate) {
   for (const char *other : {"rsa1024", "rsa2048", "rsa3072", "p256", "p384", "p521", "p224", "ed25519"}) {
     const bool same = std::string(other) == GetParam().key;
     EXPECT_EQ(VerifyMessage(*FixtureCertificate(other), GetParam().scheme, GetParam().algorithm, m_value), same)
@@ -113,7 +113,7 @@ TEST_P(SignatureValues, AreFalseForEveryOtherCertificate) {
   }
 }
 
-TEST_P(SignatureValues, OfOursHaveTheSameFormAndVerify) {
+TEST_P(VerifyDigestTest, AcceptsAValueOfTheSameSizeMadeBySignDigest) {
   const DigestValue digest = DigestOf(GetParam().algorithm, ReadFixture("message.txt"));
   const std::vector<std::uint8_t> ours =
       SignDigest(*FixtureKey(GetParam().key), GetParam().scheme, GetParam().algorithm, digest.data());
@@ -131,7 +131,7 @@ constexpr auto SHA256 = DigestAlgorithm::SHA256;
 constexpr auto SHA384 = DigestAlgorithm::SHA384;
 constexpr auto SHA512 = DigestAlgorithm::SHA512;
 
-INSTANTIATE_TEST_SUITE_P(All, SignatureValues,
+INSTANTIATE_TEST_SUITE_P(All, VerifyDigestTest,
                          ::testing::Values(SignedFixture{"rsa2048", PKCS1, SHA256, "rsa2048-pkcs1-sha256.sig"},
                                            SignedFixture{"rsa2048", PKCS1, SHA384, "rsa2048-pkcs1-sha384.sig"},
                                            SignedFixture{"rsa2048", PKCS1, SHA512, "rsa2048-pkcs1-sha512.sig"},
@@ -173,7 +173,7 @@ TEST(VerifyDigest, KeepsTheErrorsOfTheHost) {
   EXPECT_EQ(ERR_get_error(), 0U);
 }
 
-TEST(VerifyDigest, AnswersRightOnManyThreadsWithOneCertificate) {
+TEST(VerifyDigest, AnswersCorrectlyOnManyThreadsWithOneCertificate) {
   constexpr int THREADS = 8;
   constexpr int ROUNDS = 200;
   const auto certificate = FixtureCertificate("rsa2048");
@@ -201,7 +201,7 @@ TEST(VerifyDigest, AnswersRightOnManyThreadsWithOneCertificate) {
   EXPECT_EQ(wrongAnswers, 0);
 }
 
-TEST(SignDigest, RefusesAKeyThatDoesNotFitTheScheme) {
+TEST(SignDigest, RefusesAKeyThatDoesNotMatchTheScheme) {
   const DigestValue digest{};
   EXPECT_THROWS_MESSAGE(SignDigest(*FixtureKey("p256"), PKCS1, SHA256, digest.data()), CryptoException,
                         "A key of algorithm EC cannot make a signature of this scheme");
@@ -209,11 +209,12 @@ TEST(SignDigest, RefusesAKeyThatDoesNotFitTheScheme) {
                         "A key of algorithm RSA cannot make a signature of this scheme");
 }
 
-TEST(SignDigest, SignsByTwoDigestsOnManyThreadsWithOneKey) {
+TEST(SignDigest, SignsTwoKindsOfDigestsOnManyThreadsWithOneKey) {
   constexpr int THREADS = 8;
   constexpr int ROUNDS = 20;
   const auto key = FixtureKey("rsa2048");
-  const auto isSignedRight = [&](DigestAlgorithm algorithm, const DigestValue &digest, const std::string &expected) {
+  const auto isSignedCorrectly = [&](DigestAlgorithm algorithm, const DigestValue &digest,
+                                     const std::string &expected) {
     const std::vector<std::uint8_t> value = SignDigest(*key, PKCS1, algorithm, digest.data());
     return std::string(value.begin(), value.end()) == expected;
   };
@@ -226,8 +227,8 @@ TEST(SignDigest, SignsByTwoDigestsOnManyThreadsWithOneKey) {
   for (int i = 0; i < THREADS; ++i) {
     threads.emplace_back([&] {
       for (int round = 0; round < ROUNDS; ++round) {
-        wrongValues += isSignedRight(SHA256, shortDigest, shortExpected) ? 0 : 1;
-        wrongValues += isSignedRight(SHA512, longDigest, longExpected) ? 0 : 1;
+        wrongValues += isSignedCorrectly(SHA256, shortDigest, shortExpected) ? 0 : 1;
+        wrongValues += isSignedCorrectly(SHA512, longDigest, longExpected) ? 0 : 1;
       }
     });
   }
@@ -243,7 +244,7 @@ struct KindOfKey {
   unsigned bits;
 };
 
-TEST(GetKeyKind, TellsEveryKind) {
+TEST(GetKeyKind, RecognisesEveryKind) {
   for (const KindOfKey &expected :
        {KindOfKey{"rsa1024", KeyKind::RSA, 1024}, KindOfKey{"rsa2048", KeyKind::RSA, 2048},
         KindOfKey{"rsa3072", KeyKind::RSA, 3072}, KindOfKey{"p256", KeyKind::EC_P256, 256},

@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 // Canonical forms that fill the canonicaliser's buffer and its table of namespaces, and the escapes that other engines leave
-// out. What is expected is written here, by no engine at all.
+// out. The expected forms are written by hand.
 
 #include "documents.h"
 
@@ -22,8 +22,8 @@ constexpr std::size_t BUFFER_BYTES = 4096; // of the canonicaliser's output
 const std::string PIECES =
     R"(<a xmlns="urn:a" xmlns:p="urn:p?a&amp;b" b="&quot;&#xA;" p:c="d">&lt;e&gt;f<?g h?><!--i--><p:j></p:j></a>k)";
 
-// Each document is canonical: no matter where the buffer is full, the form is the document itself.
-TEST(CanonicalizeBoundaries, EachPieceMayMeetTheEndOfTheBuffer) {
+// Each document is canonical: wherever the buffer is full, the canonical form is the document itself.
+TEST(Canonicalize, WritesEachPieceAcrossTheEndOfTheBuffer) {
   for (const std::size_t buffers : {std::size_t{1}, std::size_t{2}}) {
     for (std::size_t before = buffers * BUFFER_BYTES - PIECES.size() - 4; before <= buffers * BUFFER_BYTES + 1;
          ++before) {
@@ -33,8 +33,8 @@ TEST(CanonicalizeBoundaries, EachPieceMayMeetTheEndOfTheBuffer) {
   }
 }
 
-// The buffer starts anew with each text that is as long as it is, or longer.
-TEST(CanonicalizeBoundaries, ATextMayBeAsLongAsTheBuffer) {
+// A text that is at least as long as the buffer is written without it.
+TEST(Canonicalize, WritesATextAsLongAsTheBuffer) {
   for (std::size_t before = 0; before <= 2; ++before) {
     for (std::size_t length = BUFFER_BYTES - 8; length <= BUFFER_BYTES + 8; ++length) {
       const std::string text = "<r>" + std::string(before, 'x') + "<a></a>" + std::string(length, 'y') + "<a></a></r>";
@@ -43,7 +43,7 @@ TEST(CanonicalizeBoundaries, ATextMayBeAsLongAsTheBuffer) {
   }
 }
 
-TEST(CanonicalizeBoundaries, OneCharacterAtATimeFillsTheBuffer) {
+TEST(Canonicalize, FillsTheBufferOneCharacterAtATime) {
   std::string text = "<r>";
   for (std::size_t count = 0; count < 2 * BUFFER_BYTES; ++count) {
     text += count % 2 == 0 ? "&amp;" : "x";
@@ -60,7 +60,7 @@ std::string Prefix(std::size_t number) {
 
 constexpr std::size_t MANY_PREFIXES = 200; // more than the table has buckets: some collide
 
-TEST(CanonicalizeBoundaries, FindsEachOfManyPrefixesInScope) {
+TEST(Canonicalize, FindsEachOfManyPrefixesInScope) {
   std::string declarations;
   std::string uses;
   std::string expected;
@@ -73,7 +73,7 @@ TEST(CanonicalizeBoundaries, FindsEachOfManyPrefixesInScope) {
   EXPECT_EQ("<r>" + expected + "</r>", CanonicalDocument("<r" + declarations + ">" + uses + "</r>", Uri::EXCLUSIVE));
 }
 
-TEST(CanonicalizeBoundaries, SortsManyPrefixesThatOneElementDeclares) {
+TEST(Canonicalize, SortsManyPrefixesThatOneElementDeclares) {
   std::string reversed;
   std::string sorted;
   for (std::size_t number = 0; number < MANY_PREFIXES; ++number) {
@@ -84,7 +84,7 @@ TEST(CanonicalizeBoundaries, SortsManyPrefixesThatOneElementDeclares) {
   EXPECT_EQ("<r" + sorted + "></r>", CanonicalDocument("<r" + reversed + "/>", Uri::INCLUSIVE));
 }
 
-TEST(CanonicalizeBoundaries, ForgetsPrefixesOfAnElementThatHasEnded) {
+TEST(Canonicalize, ForgetsThePrefixesOfAnElementThatHasEnded) {
   std::string inner;
   std::string innerCanonical;
   for (std::size_t number = 0; number < MANY_PREFIXES; ++number) {
@@ -101,8 +101,8 @@ TEST(CanonicalizeBoundaries, ForgetsPrefixesOfAnElementThatHasEnded) {
             CanonicalDocument("<r" + declarations + ">" + inner + "</r>", Uri::EXCLUSIVE));
 }
 
-// Canonical XML 1.0, section 2.3: a namespace node is written as an attribute is.
-TEST(CanonicalizeBoundaries, EscapesANamespaceNameAsAnAttributeValue) {
+// Canonical XML 1.0, section 2.3: a namespace node is written like an attribute.
+TEST(Canonicalize, EscapesANamespaceNameLikeAnAttributeValue) {
   const std::string canonical = "<p:r xmlns=\"urn:a?b&amp;c='\" xmlns:p=\"urn:p?x&amp;y\"><s></s></p:r>";
   EXPECT_EQ(canonical, CanonicalDocument(canonical, Uri::INCLUSIVE));
   EXPECT_EQ("<p:r xmlns:p=\"urn:p?x&amp;y\"><s xmlns=\"urn:a?b&amp;c='\"></s></p:r>",
@@ -110,7 +110,7 @@ TEST(CanonicalizeBoundaries, EscapesANamespaceNameAsAnAttributeValue) {
 }
 
 // A parser may refuse such a name; a tree that was not parsed may have it.
-TEST(CanonicalizeBoundaries, EscapesEachCharacterOfANamespaceNameThatHasAnEscape) {
+TEST(Canonicalize, EscapesEachSpecialCharacterOfANamespaceName) {
   Tarvel::Ref<Tarvel::Xml::ElementNode> element;
   Tarvel::Xml::CreateElementNode("p", "r", element);
   element->DefineAttribute("xmlns:p", "urn:&<>\"'\t\n\r");
@@ -118,7 +118,7 @@ TEST(CanonicalizeBoundaries, EscapesEachCharacterOfANamespaceNameThatHasAnEscape
   EXPECT_EQ("<p:r xmlns:p=\"urn:&amp;&lt;>&quot;'&#x9;&#xA;&#xD;\"></p:r>", CanonicalForm(*element, Uri::EXCLUSIVE));
 }
 
-/// An element with `before` plain characters, `character` and `after` plain ones for its text and its attribute.
+/// An element whose text and attribute are `before` plain characters, `character` and `after` plain characters.
 Tarvel::Ref<Tarvel::Xml::ElementNode> ElementWith(std::size_t before, char character, std::size_t after) {
   const std::string value = std::string(before, 'x') + character + std::string(after, 'y');
   Tarvel::Ref<Tarvel::Xml::ElementNode> element;
@@ -137,8 +137,8 @@ struct EscapedCharacter {
   const char *inAttribute;
 };
 
-// Octets are looked at in blocks of 16; so every place of two blocks and of what is left is tried.
-TEST(CanonicalizeBoundaries, EscapesACharacterAtEveryPlaceOfAValue) {
+// Octets are checked in blocks of 16, so every position in two blocks and in the rest is tried.
+TEST(Canonicalize, EscapesACharacterAtEveryPositionOfAValue) {
   constexpr std::size_t LONGEST = 36;
   for (const EscapedCharacter &escaped :
        {EscapedCharacter{'&', "&amp;", "&amp;"}, EscapedCharacter{'<', "&lt;", "&lt;"},
@@ -156,7 +156,7 @@ TEST(CanonicalizeBoundaries, EscapesACharacterAtEveryPlaceOfAValue) {
   }
 }
 
-TEST(CanonicalizeBoundaries, EscapesEachOfManyCharactersInOneValue) {
+TEST(Canonicalize, EscapesEachOfManyCharactersInOneValue) {
   const std::string value(40, '<');
   std::string escaped;
   for (std::size_t i = 0; i < value.size(); ++i) {
@@ -167,18 +167,18 @@ TEST(CanonicalizeBoundaries, EscapesEachOfManyCharactersInOneValue) {
   EXPECT_EQ("<r a=\"" + escaped + "\">x</r>", CanonicalForm(*element, Uri::EXCLUSIVE));
 }
 
-TEST(CanonicalizeBoundaries, FindsAPrefixAnewWhereItsMeaningChanges) {
+TEST(Canonicalize, LooksUpAPrefixAgainWhereItsMeaningChanges) {
   const std::string document = "<a:r xmlns:a=\"urn:1\"><a:e xmlns:a=\"urn:2\"><a:f></a:f></a:e><a:g></a:g></a:r>";
   EXPECT_EQ(document, CanonicalDocument(document, Uri::EXCLUSIVE));
   EXPECT_EQ(document, CanonicalDocument(document, Uri::INCLUSIVE));
 }
 
-TEST(CanonicalizeBoundaries, ForgetsADeclarationThatNobodyUsedWhereItsElementEnds) {
+TEST(Canonicalize, ForgetsAnUnusedDeclarationWhereItsElementEnds) {
   EXPECT_EQ("<r><e></e><a:f xmlns:a=\"urn:1\"></a:f></r>",
             CanonicalDocument("<r xmlns:a=\"urn:1\"><e xmlns:a=\"urn:2\"/><a:f/></r>", Uri::EXCLUSIVE));
 }
 
-TEST(CanonicalizeBoundaries, KeepsDataOfOneCharacterInAProcessingInstruction) {
+TEST(Canonicalize, KeepsDataOfOneCharacterInAProcessingInstruction) {
   EXPECT_EQ("<?a b?>\n<r><?c d?><?e f g?><?h?></r>\n<?i j?>",
             CanonicalDocument("<?a b?><r><?c   d?><?e f g?><?h ?></r><?i\nj?>", Uri::INCLUSIVE));
 }

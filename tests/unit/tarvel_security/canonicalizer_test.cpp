@@ -14,8 +14,8 @@ using Testing::CanonicalForm;
 using Testing::FindElement;
 using Testing::ParseDocument;
 
-// The examples of Canonical XML 1.0, section 3. A document type declaration is refused by the parser, so each example stands
-// without its own; 3.5 (entity references) and 3.7 (XPath subsets) have nothing left then.
+// The examples of Canonical XML 1.0, section 3. The parser refuses document type declarations, so the examples are used
+// without them. Nothing is then left of 3.5 (entity references) and 3.7 (XPath subsets).
 
 constexpr std::string_view OUTSIDE_NODES = R"(<?xml version="1.0"?>
 
@@ -101,7 +101,7 @@ TEST(CanonicalizeExample, StartAndEndTags) {
                         Uri::INCLUSIVE));
 }
 
-// Without the attribute whose type a declaration would make one of name tokens.
+// Without the attribute whose type the example declares as name tokens.
 TEST(CanonicalizeExample, CharacterModifications) {
   EXPECT_EQ(R"(<doc>
    <text>First line&#xD;
@@ -121,7 +121,7 @@ Second line</text>
                               Uri::INCLUSIVE));
 }
 
-// Without its encoding declaration, which names another encoding than the one that the parser reads.
+// Without its encoding declaration: the parser accepts no encoding but UTF-8.
 TEST(CanonicalizeExample, Utf8Encoding) {
   EXPECT_EQ("<doc>\xC2\xA9</doc>", CanonicalDocument("<doc>&#169;</doc>", Uri::INCLUSIVE));
 }
@@ -151,7 +151,7 @@ std::string CanonicalElem2(std::string_view text, std::string_view uri, const st
   return CanonicalForm(FindElement(*document, "elem2"), uri, prefixes);
 }
 
-TEST(CanonicalizeExample, InclusiveFormOfAnElementTakesOverWhatItsEnvelopeDeclares) {
+TEST(CanonicalizeExample, InclusiveFormOfAnElementInheritsTheDeclarationsOfItsEnvelope) {
   EXPECT_EQ(R"(<n1:elem2 xmlns:n0="foo:bar" xmlns:n1="http://example.net" xmlns:n3="ftp://example.org" xml:lang="en">
     <n3:stuff></n3:stuff>
   </n1:elem2>)",
@@ -171,37 +171,37 @@ TEST(CanonicalizeExample, ExclusiveFormOfAnElementIsTheSameInEveryEnvelope) {
   EXPECT_EQ(expected, CanonicalElem2(SECOND_ENVELOPE, Uri::EXCLUSIVE));
 }
 
-TEST(Canonicalize, InclusiveNamespacesAreDeclaredThoughNobodyUsesThem) {
+TEST(Canonicalize, DeclaresInclusiveNamespacesEvenIfUnused) {
   EXPECT_EQ(R"(<n1:elem2 xmlns:n1="http://example.net" xmlns:n2="http://foo.example" xml:lang="en">
     <n3:stuff xmlns:n3="ftp://example.org"></n3:stuff>
   </n1:elem2>)",
             CanonicalElem2(SECOND_ENVELOPE, Uri::EXCLUSIVE, {"n2", "notdeclared"}));
 }
 
-TEST(Canonicalize, InclusiveDefaultNamespaceIsDeclaredThoughNobodyUsesIt) {
+TEST(Canonicalize, DeclaresTheInclusiveDefaultNamespaceEvenIfUnused) {
   constexpr std::string_view TEXT = R"(<a xmlns="urn:a"><p:elem2 xmlns:p="urn:p"><c xmlns=""/></p:elem2></a>)";
   EXPECT_EQ(R"(<p:elem2 xmlns:p="urn:p"><c></c></p:elem2>)", CanonicalElem2(TEXT, Uri::EXCLUSIVE));
   EXPECT_EQ(R"(<p:elem2 xmlns="urn:a" xmlns:p="urn:p"><c xmlns=""></c></p:elem2>)",
             CanonicalElem2(TEXT, Uri::EXCLUSIVE, {"#default"}));
 }
 
-TEST(Canonicalize, InclusiveUriWithALoneNumberSignIsTheInclusiveAlgorithm) {
+TEST(Canonicalize, TreatsTheInclusiveUriWithALoneNumberSignAsTheInclusiveAlgorithm) {
   EXPECT_EQ(CanonicalDocument(FIRST_ENVELOPE, Uri::INCLUSIVE),
             CanonicalDocument(FIRST_ENVELOPE, std::string(Uri::INCLUSIVE) + "#"));
 }
 
-TEST(Canonicalize, ExclusiveFormKeepsCommentsOnlyWhenAskedTo) {
+TEST(Canonicalize, KeepsCommentsInTheExclusiveFormOnlyIfAskedTo) {
   constexpr std::string_view TEXT = "<!--1--><doc><!--2--></doc><!--3-->";
   EXPECT_EQ("<doc></doc>", CanonicalDocument(TEXT, Uri::EXCLUSIVE));
   EXPECT_EQ("<!--1-->\n<doc><!--2--></doc>\n<!--3-->", CanonicalDocument(TEXT, Uri::EXCLUSIVE_WITH_COMMENTS));
 }
 
-TEST(Canonicalize, ExclusiveFormDeclaresANamespaceAgainOnEachBranchThatUsesIt) {
+TEST(Canonicalize, DeclaresANamespaceInTheExclusiveFormOnEachBranchThatUsesIt) {
   EXPECT_EQ(R"(<r><p:a xmlns:p="urn:p"><p:b></p:b></p:a><p:c xmlns:p="urn:p"></p:c><d xmlns:p="urn:p" p:e=""></d></r>)",
             CanonicalDocument(R"(<r xmlns:p="urn:p"><p:a><p:b/></p:a><p:c/><d p:e=""/></r>)", Uri::EXCLUSIVE));
 }
 
-TEST(Canonicalize, RedeclaredPrefixIsWrittenWhereItsMeaningChanges) {
+TEST(Canonicalize, WritesARedeclaredPrefixWhereItsMeaningChanges) {
   constexpr std::string_view TEXT =
       R"(<p:a xmlns:p="urn:1"><p:b xmlns:p="urn:2"><p:c xmlns:p="urn:1"/></p:b><p:d xmlns:p="urn:1"/></p:a>)";
   constexpr std::string_view CANONICAL =
@@ -210,20 +210,20 @@ TEST(Canonicalize, RedeclaredPrefixIsWrittenWhereItsMeaningChanges) {
   EXPECT_EQ(CANONICAL, CanonicalDocument(TEXT, Uri::EXCLUSIVE));
 }
 
-TEST(Canonicalize, NearestXmlAttributeOfTheAncestorsIsTakenOver) {
+TEST(Canonicalize, InheritsTheNearestXmlAttributeOfTheAncestors) {
   const auto document = ParseDocument(R"(<a xml:lang="en" xml:space="preserve"><b xml:lang="de"><c x="y"/></b></a>)");
   EXPECT_EQ(R"(<c x="y" xml:lang="de" xml:space="preserve"></c>)",
             CanonicalForm(FindElement(*document, "c"), Uri::INCLUSIVE));
   EXPECT_EQ(R"(<c x="y"></c>)", CanonicalForm(FindElement(*document, "c"), Uri::EXCLUSIVE));
 }
 
-TEST(Canonicalize, DeclarationOfTheXmlPrefixIsNeverWritten) {
+TEST(Canonicalize, NeverWritesADeclarationOfTheXmlPrefix) {
   EXPECT_EQ(
       "<a xml:lang=\"en\"></a>",
       CanonicalDocument(R"(<a xmlns:xml="http://www.w3.org/XML/1998/namespace" xml:lang="en"/>)", Uri::INCLUSIVE));
 }
 
-TEST(Canonicalize, TextLongerThanAnyBufferIsWrittenWhole) {
+TEST(Canonicalize, WritesATextThatIsLongerThanAnyBuffer) {
   const std::string text = "<doc>" + std::string(100'000, 'x') + "</doc>";
   EXPECT_EQ(text, CanonicalDocument(text, Uri::INCLUSIVE));
 }

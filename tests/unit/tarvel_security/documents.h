@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// What the tests of this folder do with documents: parse them, canonicalise them, take them from the fixtures.
+/// Parsing, canonicalising and verifying documents in the tests of this folder.
 
 #pragma once
 
@@ -62,7 +62,7 @@ inline const Tarvel::Xml::ElementNode &FindElement(const Tarvel::Xml::Document &
   throw std::logic_error("no element " + std::string(localName));
 }
 
-/// `text` with `from`, which must stand in it, replaced once.
+/// `text` with the first `from`, which must occur in it, replaced.
 inline std::string Replaced(std::string text, std::string_view from, std::string_view to) {
   const std::size_t at = text.find(from);
   if (at == std::string::npos) {
@@ -79,7 +79,7 @@ inline Tarvel::Crypto::CertificateList Trusted(const std::vector<std::string> &n
   return certificates;
 }
 
-/// The signature of a document whose document element is what is signed.
+/// The signature of a document whose document element is signed.
 inline Tarvel::Ref<Tarvel::Xml::Security::Signature> SignatureOf(const Tarvel::Xml::Document &document) {
   Tarvel::Ref<Tarvel::Xml::Security::Signature> signature;
   Tarvel::Xml::Security::CreateSignatureFromDom(*document.GetDocumentElement(), FindElement(document, "Signature"),

@@ -18,7 +18,7 @@ std::string Base64Of(const std::string &name) {
   return Tarvel::StringUtil::Base64Encode(Trusted({name}).front()->GetDer());
 }
 
-/// What a resolver over `trusted` makes of a `ds:KeyInfo` with that content.
+/// What a resolver over `trusted` returns for a `ds:KeyInfo` with that content.
 CertificateList Resolve(const CertificateList &trusted, const std::string &content) {
   const auto document =
       ParseDocument("<ds:KeyInfo xmlns:ds='http://www.w3.org/2000/09/xmldsig#'>" + content + "</ds:KeyInfo>");
@@ -34,15 +34,15 @@ protected:
   const CertificateList m_trusted = Trusted({"sts-rsa", "sts-rsa-2", "sts-ec256"});
 };
 
-TEST_F(TrustSetKeyResolver, GivesTheWholeSetWithoutKeyInfo) {
+TEST_F(TrustSetKeyResolver, ReturnsTheWholeSetWithoutKeyInfo) {
   EXPECT_EQ(m_trusted, CreateTrustSetKeyResolver(m_trusted)->Resolve(nullptr));
 }
 
-TEST_F(TrustSetKeyResolver, SelectsTheTrustedCertificateThatKeyInfoHolds) {
+TEST_F(TrustSetKeyResolver, SelectsTheTrustedCertificateThatKeyInfoContains) {
   EXPECT_EQ(CertificateList{m_trusted[1]}, Resolve(m_trusted, X509(Base64Of("sts-rsa-2"))));
 }
 
-TEST_F(TrustSetKeyResolver, LooksPastWhiteSpaceInTheCertificate) {
+TEST_F(TrustSetKeyResolver, IgnoresWhiteSpaceInTheCertificate) {
   std::string text = Base64Of("sts-rsa-2");
   for (std::size_t at = 0; at < text.size(); at += 65) {
     text.insert(at, "\n");
@@ -50,8 +50,8 @@ TEST_F(TrustSetKeyResolver, LooksPastWhiteSpaceInTheCertificate) {
   EXPECT_EQ(CertificateList{m_trusted[1]}, Resolve(m_trusted, X509(" " + text + "\t")));
 }
 
-// Of the longest certificate, whose length bounds how much of a text is looked at.
-TEST_F(TrustSetKeyResolver, LeavesTheWholeSetForATextThatOnlyBeginsWithATrustedCertificate) {
+// With the longest certificate, because its length limits how much of a text is read.
+TEST_F(TrustSetKeyResolver, ReturnsTheWholeSetForATextThatOnlyBeginsWithATrustedCertificate) {
   std::string longest;
   for (const char *const name : {"sts-rsa", "sts-rsa-2", "sts-ec256"}) {
     const std::string text = Base64Of(name);
@@ -61,7 +61,7 @@ TEST_F(TrustSetKeyResolver, LeavesTheWholeSetForATextThatOnlyBeginsWithATrustedC
   EXPECT_EQ(m_trusted, Resolve(m_trusted, X509(longest + " A")));
 }
 
-TEST_F(TrustSetKeyResolver, SelectsAllTrustedCertificatesThatKeyInfoHolds) {
+TEST_F(TrustSetKeyResolver, SelectsAllTrustedCertificatesThatKeyInfoContains) {
   EXPECT_EQ((CertificateList{m_trusted[2], m_trusted[0]}),
             Resolve(m_trusted, X509(Base64Of("sts-ec256")) + X509(Base64Of("other")) + X509(Base64Of("sts-rsa")) +
                                    X509(Base64Of("sts-ec256"))));
@@ -72,11 +72,11 @@ TEST_F(TrustSetKeyResolver, NeverTakesACertificateFromTheMessage) {
   EXPECT_TRUE(Resolve({}, X509(Base64Of("other"))).empty());
 }
 
-TEST_F(TrustSetKeyResolver, LeavesTheWholeSetForAnotherCertificateOfATrustedKey) {
+TEST_F(TrustSetKeyResolver, ReturnsTheWholeSetForAnotherCertificateOfATrustedKey) {
   EXPECT_EQ(m_trusted, Resolve(m_trusted, X509(Base64Of("sts-rsa-reissued"))));
 }
 
-TEST_F(TrustSetKeyResolver, LeavesTheWholeSetForEverythingElse) {
+TEST_F(TrustSetKeyResolver, ReturnsTheWholeSetForEverythingElse) {
   const std::string trusted = Base64Of("sts-rsa-2");
   for (const std::string &content :
        {std::string(), std::string("text"), std::string("<ds:KeyName>sts</ds:KeyName>"), std::string("<ds:X509Data/>"),
@@ -89,13 +89,13 @@ TEST_F(TrustSetKeyResolver, LeavesTheWholeSetForEverythingElse) {
   }
 }
 
-TEST_F(TrustSetKeyResolver, CountsEqualCertificatesOnceAndPassesOverNull) {
+TEST_F(TrustSetKeyResolver, IgnoresDuplicatesAndNulls) {
   CertificateList trusted = Trusted({"sts-rsa", "sts-rsa"});
   trusted.push_back({});
   EXPECT_EQ(CertificateList{trusted.front()}, CreateTrustSetKeyResolver(trusted)->Resolve(nullptr));
 }
 
-TEST_F(TrustSetKeyResolver, StopsLookingAfterSixteenCertificates) {
+TEST_F(TrustSetKeyResolver, ComparesOnlySixteenCertificates) {
   std::string content;
   for (int count = 0; count < 16; ++count) {
     content += X509("AAAA");

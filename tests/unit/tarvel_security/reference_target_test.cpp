@@ -15,7 +15,7 @@ namespace {
 
 using ::Testing::ParseDocument;
 
-TEST(ResolveReferences, GivesEachOfEqualReferencesTheSameNode) {
+TEST(ResolveReferences, ResolvesEqualReferencesToTheSameNode) {
   const Ref<Document> document = ParseDocument("<r ID='a'><x Id='b'/></r>");
   const ElementNode *const root = document->GetDocumentElement();
   const Node *const x = root->GetFirstChild();
@@ -32,7 +32,7 @@ std::vector<std::pair<std::string_view, std::size_t>> SearchedFor(const std::vec
   return searched;
 }
 
-TEST(PlanSearches, SearchesOnceForAnIdentifierHoweverOftenItIsRepeated) {
+TEST(PlanSearches, SearchesOnceForARepeatedIdentifier) {
   using Searches = std::vector<std::pair<std::string_view, std::size_t>>;
   EXPECT_EQ(SearchedFor(std::vector<std::string_view>(1000, "#a")), (Searches{{"a", 0}}));
   EXPECT_EQ(SearchedFor({"", "#b", "#a", "#b", "", "#a"}), (Searches{{"b", 1}, {"a", 2}}));

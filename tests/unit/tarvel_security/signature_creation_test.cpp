@@ -60,7 +60,7 @@ std::string SignedMessage(std::string_view algorithm, std::string_view digest, s
   return Serialise(*document);
 }
 
-TEST(Sign, MakesASignatureThatHoldsAfterWritingAndParsingAgain) {
+TEST(Sign, MakesASignatureThatVerifiesAfterWritingAndParsing) {
   for (const std::string_view algorithm : {Uri::RSA_SHA256, Uri::RSA_SHA384, Uri::RSA_SHA512}) {
     for (const std::string_view digest : {Uri::DIGEST_SHA256, Uri::DIGEST_SHA384, Uri::DIGEST_SHA512}) {
       const std::string text = SignedMessage(algorithm, digest);
@@ -71,7 +71,7 @@ TEST(Sign, MakesASignatureThatHoldsAfterWritingAndParsingAgain) {
   }
 }
 
-TEST(Sign, WorksWithEachPrefixAndWithNone) {
+TEST(Sign, WorksWithAnyPrefixAndWithoutOne) {
   EXPECT_TRUE(VerifyText(SignedMessage(Uri::RSA_SHA256, Uri::DIGEST_SHA256, "")));
   EXPECT_TRUE(VerifyText(SignedMessage(Uri::RSA_SHA256, Uri::DIGEST_SHA256, "e")));
 }
@@ -89,7 +89,7 @@ TEST(Sign, WritesTheElementsInTheirOrderWithoutWhiteSpace) {
   EXPECT_NE(std::string::npos, text.find("</ds:SignedInfo><ds:SignatureValue>"));
 }
 
-TEST(Sign, PutsTheKeyInfoBehindTheSignatureValue) {
+TEST(Sign, PutsTheKeyInfoAfterTheSignatureValue) {
   const Ref<Document> document = ParseDocument(MESSAGE);
   const Ref<Signature> signature = BlankSignatureOf(*document);
   signature->AddReference("#b", Uri::DIGEST_SHA256, EXCLUSIVE);
@@ -104,7 +104,7 @@ TEST(Sign, PutsTheKeyInfoBehindTheSignatureValue) {
   EXPECT_TRUE(VerifyText(text));
 }
 
-TEST(Sign, CanBeVerifiedInPlace) {
+TEST(Sign, MakesASignatureThatVerifiesInPlace) {
   const Ref<Document> document = ParseDocument(MESSAGE);
   const Ref<Signature> signature = BlankSignatureOf(*document);
   signature->AddReference("#b", Uri::DIGEST_SHA256, EXCLUSIVE);
@@ -115,7 +115,7 @@ TEST(Sign, CanBeVerifiedInPlace) {
   EXPECT_EQ(std::set<std::string>{"#b"}, uris);
 }
 
-TEST(CreateBlankSignature, RefusesWhatItDoesNotSignWith) {
+TEST(CreateBlankSignature, RefusesAlgorithmsThatAreNotSupported) {
   const Ref<Document> document = ParseDocument(MESSAGE);
   const Ref<ElementNode> root(document->GetDocumentElement());
   Ref<Signature> signature;
@@ -133,7 +133,7 @@ TEST(CreateBlankSignature, RefusesWhatItDoesNotSignWith) {
                         "Invalid argument : a signature needs an element to resolve its references in");
 }
 
-TEST(AddReference, RefusesWhatItDoesNotSignWith) {
+TEST(AddReference, RefusesAlgorithmsThatAreNotSupported) {
   const Ref<Document> document = ParseDocument(MESSAGE);
   const Ref<Signature> signature = BlankSignatureOf(*document);
   EXPECT_THROWS_MESSAGE(
@@ -169,7 +169,7 @@ TEST(Sign, RefusesAKeyOfAnotherKind) {
   EXPECT_NO_THROW(signature->Sign(*Key("sts-rsa")));
 }
 
-TEST(Sign, HappensOnce) {
+TEST(Sign, RefusesAnyChangeAfterSigning) {
   const Ref<Document> document = ParseDocument(MESSAGE);
   const Ref<Signature> signature = BlankSignatureOf(*document);
   signature->AddReference("#b", Uri::DIGEST_SHA256, EXCLUSIVE);

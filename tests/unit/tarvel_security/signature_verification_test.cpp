@@ -1,6 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 
 #include "documents.h"
+#include "genuine_token.h"
 #include "support/data_file.h"
 #include "support/throws_message.h"
 
@@ -19,9 +20,12 @@ namespace {
 namespace Uri = Tarvel::Xml::Security::SignatureUri;
 using Tarvel::Xml::Security::CreateTrustSetKeyResolver;
 using Tarvel::Xml::Security::XmlSecurityException;
-using Testing::FindElement;
+using Testing::GenuineToken;
+using Testing::IdOf;
 using Testing::ParseDocument;
 using Testing::ReadDataFile;
+using Testing::Refusal;
+using Testing::RefusalOf;
 using Testing::Replaced;
 using Testing::SignatureOf;
 using Testing::Trusted;
@@ -63,32 +67,32 @@ constexpr SignedFixture SIGNED_FIXTURES[] = {
     {"reference-two", "sts-rsa"},
 };
 
-class VerifyFixture : public ::testing::TestWithParam<SignedFixture> {
+class VerifyTest : public ::testing::TestWithParam<SignedFixture> {
 protected:
   std::string Text() const { return ReadDataFile(std::string("tokens/") + GetParam().name + ".xml"); }
 };
 
-TEST_P(VerifyFixture, AcceptsWhatOthersSigned) {
+TEST_P(VerifyTest, AcceptsSignaturesOfOtherImplementations) {
   EXPECT_TRUE(VerifyText(Text(), {GetParam().certificate}));
 }
 
-TEST_P(VerifyFixture, AnswersFalseWhenContentWasChanged) {
+TEST_P(VerifyTest, AnswersFalseWhenContentWasChanged) {
   EXPECT_FALSE(VerifyText(Replaced(Text(), "alice", "malice"), {GetParam().certificate}));
 }
 
-TEST_P(VerifyFixture, AnswersFalseWhenTheSignatureValueWasChanged) {
+TEST_P(VerifyTest, AnswersFalseWhenTheSignatureValueWasChanged) {
   std::string text = Text();
   const std::size_t value = text.find("SignatureValue>") + 20;
   text[value] = text[value] == 'A' ? 'B' : 'A';
   EXPECT_FALSE(VerifyText(text, {GetParam().certificate}));
 }
 
-TEST_P(VerifyFixture, FindsTheKeyAmongAllTrustedOnes) {
+TEST_P(VerifyTest, FindsTheKeyAmongAllTrustedOnes) {
   EXPECT_TRUE(
       VerifyText(Text(), {"other", "sts-rsa-2", "sts-ec521", "sts-ec384", "sts-ec256", "sts-rsa3072", "sts-rsa"}));
 }
 
-INSTANTIATE_TEST_SUITE_P(Verify, VerifyFixture, ::testing::ValuesIn(SIGNED_FIXTURES), [](const auto &fixture) {
+INSTANTIATE_TEST_SUITE_P(Verify, VerifyTest, ::testing::ValuesIn(SIGNED_FIXTURES), [](const auto &fixture) {
   std::string name = fixture.param.name;
   std::replace(name.begin(), name.end(), '-', '_');
   return name;
@@ -108,46 +112,22 @@ TEST(Verify, RefusesRsaKeysWithoutASoundExponent) {
   EXPECT_FALSE(VerifyText(forged, {"sts-rsa-e1", "sts-rsa"}));
 }
 
-const std::string EXCLUSIVE_TRANSFORM = R"(<ds:Transform Algorithm="http://www.w3.org/2001/10/xml-exc-c14n#"/>)";
-
-std::string GoodToken() {
-  return ReadDataFile("tokens/rsa-sha256.xml");
-}
-
-std::string IdOf(const std::string &token) {
-  const std::size_t begin = token.find(" ID=\"") + 5;
-  return token.substr(begin, token.find('"', begin) - begin);
-}
-
-/// The message with which the good token is refused when one text of it is replaced.
-std::string RefusalOf(const std::string &text) {
-  try {
-    return VerifyText(text) ? "accepted" : "wrong";
-  } catch (const XmlSecurityException &exception) {
-    return exception.what();
-  }
-}
-
-std::string Refusal(std::string_view from, std::string_view to) {
-  return RefusalOf(Replaced(GoodToken(), from, to));
-}
-
-TEST(Verify, GivesTheUrisOfWhatIsSignedWhenTheAnswerIsTrue) {
+TEST(Verify, AddsTheSignedUrisWhenTheResultIsTrue) {
   const auto resolver = CreateTrustSetKeyResolver(Trusted({"sts-rsa"}));
   std::set<std::string> uris{"before"};
-  EXPECT_TRUE(SignatureOf(*ParseDocument(GoodToken()))->Verify(*resolver, uris));
-  EXPECT_EQ((std::set<std::string>{"before", "#" + IdOf(GoodToken())}), uris);
+  EXPECT_TRUE(SignatureOf(*ParseDocument(GenuineToken()))->Verify(*resolver, uris));
+  EXPECT_EQ((std::set<std::string>{"before", "#" + IdOf(GenuineToken())}), uris);
 }
 
-TEST(Verify, LeavesTheUrisAloneWhenTheAnswerIsFalse) {
+TEST(Verify, DoesNotChangeTheUrisWhenTheResultIsFalse) {
   const auto resolver = CreateTrustSetKeyResolver(Trusted({"sts-rsa"}));
   std::set<std::string> uris;
-  EXPECT_FALSE(SignatureOf(*ParseDocument(Replaced(GoodToken(), "alice", "malice")))->Verify(*resolver, uris));
+  EXPECT_FALSE(SignatureOf(*ParseDocument(Replaced(GenuineToken(), "alice", "malice")))->Verify(*resolver, uris));
   EXPECT_TRUE(uris.empty());
 }
 
-TEST(Verify, AnswersTheSameEachTime) {
-  const auto signature = SignatureOf(*ParseDocument(GoodToken()));
+TEST(Verify, ReturnsTheSameResultEachTime) {
+  const auto signature = SignatureOf(*ParseDocument(GenuineToken()));
   const auto resolver = CreateTrustSetKeyResolver(Trusted({"sts-rsa"}));
   std::set<std::string> uris;
   EXPECT_TRUE(signature->Verify(*resolver, uris));
@@ -155,20 +135,20 @@ TEST(Verify, AnswersTheSameEachTime) {
 }
 
 TEST(Verify, AnswersFalseWhenNoTrustedKeyMadeTheSignature) {
-  EXPECT_FALSE(VerifyText(GoodToken(), {"other", "sts-rsa-2"}));
+  EXPECT_FALSE(VerifyText(GenuineToken(), {"other", "sts-rsa-2"}));
   EXPECT_FALSE(VerifyText(ReadDataFile("tokens/signed-by-other.xml")));
 }
 
 TEST(Verify, AcceptsAnotherCertificateOfATrustedKeyAndOneThatHasExpired) {
-  EXPECT_TRUE(VerifyText(GoodToken(), {"sts-rsa-reissued"}));
-  EXPECT_TRUE(VerifyText(GoodToken(), {"sts-rsa-expired"}));
+  EXPECT_TRUE(VerifyText(GenuineToken(), {"sts-rsa-reissued"}));
+  EXPECT_TRUE(VerifyText(GenuineToken(), {"sts-rsa-expired"}));
 }
 
-TEST(Verify, RefusesWhenNoTrustedKeyFitsTheAlgorithm) {
+TEST(Verify, RefusesWhenNoTrustedKeyMatchesTheAlgorithm) {
   const std::string refusal = "No trusted key can be used with the signature algorithm \"";
-  EXPECT_THROWS_MESSAGE(VerifyText(GoodToken(), {}), XmlSecurityException,
+  EXPECT_THROWS_MESSAGE(VerifyText(GenuineToken(), {}), XmlSecurityException,
                         refusal + std::string(Uri::RSA_SHA256) + "\"");
-  EXPECT_THROWS_MESSAGE(VerifyText(GoodToken(), {"sts-ec256"}), XmlSecurityException,
+  EXPECT_THROWS_MESSAGE(VerifyText(GenuineToken(), {"sts-ec256"}), XmlSecurityException,
                         refusal + std::string(Uri::RSA_SHA256) + "\"");
   EXPECT_THROWS_MESSAGE(VerifyText(ReadDataFile("tokens/ecdsa-p256-sha256.xml"), {"sts-rsa"}), XmlSecurityException,
                         refusal + std::string(Uri::ECDSA_SHA256) + "\"");
@@ -178,109 +158,6 @@ TEST(Verify, RefusesAnRsaKeyOfLessThan2048Bits) {
   EXPECT_THROWS_MESSAGE(VerifyText(ReadDataFile("tokens/rsa1024.xml"), {"sts-rsa1024"}), XmlSecurityException,
                         "No trusted key can be used with the signature algorithm \"" + std::string(Uri::RSA_SHA256) +
                             "\"");
-}
-
-TEST(Verify, RefusesEachOtherSignatureAlgorithmByName) {
-  for (const std::string uri :
-       {"http://www.w3.org/2000/09/xmldsig#rsa-sha1", "http://www.w3.org/2000/09/xmldsig#dsa-sha1",
-        "http://www.w3.org/2000/09/xmldsig#hmac-sha1", "http://www.w3.org/2001/04/xmldsig-more#hmac-sha256",
-        "http://www.w3.org/2001/04/xmldsig-more#rsa-md5", "http://www.w3.org/2001/04/xmldsig-more#rsa-sha224",
-        "http://www.w3.org/2001/04/xmldsig-more#rsa-ripemd160", "http://www.w3.org/2001/04/xmldsig-more#ecdsa-sha1",
-        "http://www.w3.org/2007/05/xmldsig-more#rsa-pss", "http://www.w3.org/2007/05/xmldsig-more#sha1-rsa-MGF1",
-        "http://www.w3.org/2001/04/xmldsig-more#RSA-SHA256", "urn:unknown", ""}) {
-    EXPECT_EQ("The signature algorithm \"" + uri + "\" is not accepted", Refusal(Uri::RSA_SHA256, uri));
-  }
-}
-
-TEST(Verify, RefusesEachOtherDigestAlgorithmByName) {
-  for (const std::string uri :
-       {"http://www.w3.org/2000/09/xmldsig#sha1", "http://www.w3.org/2001/04/xmldsig-more#md5",
-        "http://www.w3.org/2001/04/xmldsig-more#sha224", "http://www.w3.org/2001/04/xmlenc#ripemd160", "urn:unknown"}) {
-    EXPECT_EQ("The digest algorithm \"" + uri + "\" is not accepted", Refusal(Uri::DIGEST_SHA256, uri));
-  }
-}
-
-TEST(Verify, RefusesEachOtherTransformByName) {
-  for (const std::string uri :
-       {"http://www.w3.org/TR/1999/REC-xpath-19991116", "http://www.w3.org/2002/06/xmldsig-filter2",
-        "http://www.w3.org/TR/1999/REC-xslt-19991116", "http://www.w3.org/2000/09/xmldsig#base64",
-        "http://www.w3.org/2006/12/xml-c14n11", "http://www.w3.org/2002/07/decrypt#XML", "urn:unknown"}) {
-    EXPECT_EQ("The transform algorithm \"" + uri + "\" is not accepted", Refusal(Uri::ENVELOPED_SIGNATURE, uri));
-  }
-}
-
-TEST(Verify, RefusesEachOtherCanonicalizationAlgorithmByName) {
-  for (const std::string uri : {"http://www.w3.org/2006/12/xml-c14n11", "http://www.w3.org/2000/09/xmldsig#minimal"}) {
-    EXPECT_EQ("The canonicalization algorithm \"" + uri + "\" is not accepted",
-              Refusal("http://www.w3.org/2001/10/xml-exc-c14n#", uri));
-  }
-}
-
-TEST(Verify, RefusesParametersOfAlgorithms) {
-  const std::string method = "<ds:SignatureMethod Algorithm=\"" + std::string(Uri::RSA_SHA256) + "\"";
-  EXPECT_EQ("The parameter \"ds:HMACOutputLength\" of the algorithm \"" + std::string(Uri::RSA_SHA256) +
-                "\" is not accepted",
-            Refusal(method + "/>", method + "><ds:HMACOutputLength>8</ds:HMACOutputLength></ds:SignatureMethod>"));
-  EXPECT_EQ("The parameter \"x\" of the algorithm \"http://www.w3.org/2001/10/xml-exc-c14n#\" is not accepted",
-            Refusal(EXCLUSIVE_TRANSFORM, Replaced(EXCLUSIVE_TRANSFORM, "/>", "><x xmlns=\"urn:x\"/></ds:Transform>")));
-  const std::string enveloped = "<ds:Transform Algorithm=\"" + std::string(Uri::ENVELOPED_SIGNATURE) + "\"";
-  EXPECT_EQ("The parameter \"ds:XPath\" of the algorithm \"" + std::string(Uri::ENVELOPED_SIGNATURE) +
-                "\" is not accepted",
-            Refusal(enveloped + "/>", enveloped + "><ds:XPath>1</ds:XPath></ds:Transform>"));
-}
-
-TEST(Verify, RefusesInclusiveNamespacesOfAnInclusiveCanonicalization) {
-  EXPECT_EQ(
-      "The parameter \"InclusiveNamespaces\" of the algorithm \"http://www.w3.org/TR/2001/REC-xml-c14n-20010315\" "
-      "is not accepted",
-      Refusal(EXCLUSIVE_TRANSFORM,
-              "<ds:Transform Algorithm=\"http://www.w3.org/TR/2001/REC-xml-c14n-20010315\"><InclusiveNamespaces "
-              "PrefixList=\"a\" xmlns=\"http://www.w3.org/2001/10/xml-exc-c14n#\"/></ds:Transform>"));
-}
-
-TEST(Verify, RefusesMoreThanTwoTransforms) {
-  EXPECT_EQ("A reference has 3 transforms; at most 2 are accepted",
-            Refusal(EXCLUSIVE_TRANSFORM, EXCLUSIVE_TRANSFORM + EXCLUSIVE_TRANSFORM));
-}
-
-TEST(Verify, RefusesATransformAfterACanonicalization) {
-  EXPECT_EQ("The transform \"http://www.w3.org/2001/10/xml-exc-c14n#\" is not accepted after "
-            "\"http://www.w3.org/2001/10/xml-exc-c14n#\"",
-            Refusal(Uri::ENVELOPED_SIGNATURE, "http://www.w3.org/2001/10/xml-exc-c14n#"));
-  const std::string swapped =
-      Replaced(Replaced(GoodToken(), EXCLUSIVE_TRANSFORM,
-                        "<ds:Transform Algorithm=\"" + std::string(Uri::ENVELOPED_SIGNATURE) + "\"/>"),
-               Uri::ENVELOPED_SIGNATURE, "http://www.w3.org/2001/10/xml-exc-c14n#");
-  EXPECT_EQ("The transform \"http://www.w3.org/2000/09/xmldsig#enveloped-signature\" is not accepted after "
-            "\"http://www.w3.org/2001/10/xml-exc-c14n#\"",
-            RefusalOf(swapped));
-}
-
-TEST(Verify, RefusesASignatureWithoutReferences) {
-  std::string text = GoodToken();
-  const std::size_t begin = text.find("<ds:Reference");
-  text.erase(begin, text.find("</ds:SignedInfo>") - begin);
-  EXPECT_EQ("The signature has no reference", RefusalOf(text));
-}
-
-TEST(Verify, RefusesMoreThanTenReferences) {
-  std::string text = GoodToken();
-  const std::size_t begin = text.find("<ds:Reference");
-  const std::size_t end = text.find("</ds:SignedInfo>");
-  const std::string reference = text.substr(begin, end - begin);
-  for (int count = 0; count < 10; ++count) {
-    text.insert(end, reference);
-  }
-  EXPECT_EQ("The signature has 11 references; at most 10 are accepted", RefusalOf(text));
-}
-
-TEST(Verify, RefusesObjects) {
-  EXPECT_EQ("A signature with ds:Object is not accepted", Refusal("</ds:Signature>", "<ds:Object/></ds:Signature>"));
-}
-
-TEST(Verify, RefusesManifestsAndEveryOtherTypeOfReference) {
-  EXPECT_EQ("A reference of the type \"http://www.w3.org/2000/09/xmldsig#Manifest\" is not accepted",
-            Refusal("<ds:Reference ", "<ds:Reference Type=\"http://www.w3.org/2000/09/xmldsig#Manifest\" "));
 }
 
 struct UriRefusal {
@@ -299,7 +176,7 @@ TEST(Verify, RefusesEachReferenceUriThatIsNeitherEmptyNorABareName) {
       {" ", "it points outside the document"},
       {"#nobody", "no element has that identifier"},
   };
-  const std::string uri = "#" + IdOf(GoodToken());
+  const std::string uri = "#" + IdOf(GenuineToken());
   for (const UriRefusal &refusal : REFUSALS) {
     EXPECT_EQ(std::string("The reference URI \"") + refusal.uri + "\" is not accepted: " + refusal.why,
               Refusal(uri, refusal.uri));
@@ -307,7 +184,7 @@ TEST(Verify, RefusesEachReferenceUriThatIsNeitherEmptyNorABareName) {
 }
 
 TEST(Verify, RefusesAnIdentifierThatTwoElementsHaveWhateverTheAttribute) {
-  const std::string id = IdOf(GoodToken());
+  const std::string id = IdOf(GenuineToken());
   const std::string refusal =
       "The reference URI \"#" + id + "\" is not accepted: several elements have that identifier";
   const std::string wsu =
@@ -319,8 +196,8 @@ TEST(Verify, RefusesAnIdentifierThatTwoElementsHaveWhateverTheAttribute) {
   }
 }
 
-TEST(Verify, TakesNoOtherAttributeForAnIdentifier) {
-  const std::string id = IdOf(GoodToken());
+TEST(Verify, TreatsNoOtherAttributeAsAnIdentifier) {
+  const std::string id = IdOf(GenuineToken());
   for (const std::string name : {"id", "iD", "xmlns:u='urn:u' u:Id", "xmlns:u='urn:u' u:ID", "AssertionID"}) {
     EXPECT_EQ("accepted", Refusal("</ds:X509Data>", "</ds:X509Data><x " + name + "='" + id + "'/>")) << name;
   }
@@ -330,13 +207,13 @@ TEST(Verify, FindsAnElementByEachKindOfIdentifier) {
   for (const std::string name :
        {"Id", "xml:id",
         "xmlns:u=\"http://docs.oasis-open.org/wss/2004/01/oasis-200401-wss-wssecurity-utility-1.0.xsd\" u:Id"}) {
-    EXPECT_EQ("wrong", Refusal(" ID=", " " + name + "=")) << name; // found, and not what was signed
+    EXPECT_EQ("wrong", Refusal(" ID=", " " + name + "=")) << name; // found, but not what was signed
   }
 }
 
 TEST(Verify, RefusesAnEnvelopedTransformWhoseReferenceDoesNotEnvelopTheSignature) {
-  const std::string uri = "#" + IdOf(GoodToken());
-  std::string text = Replaced(GoodToken(), uri, "#elsewhere");
+  const std::string uri = "#" + IdOf(GenuineToken());
+  std::string text = Replaced(GenuineToken(), uri, "#elsewhere");
   text = Replaced(text, "<saml:Subject>", "<saml:Subject ID=\"elsewhere\">");
   EXPECT_EQ(
       "The reference URI \"#elsewhere\" has the enveloped-signature transform, but does not envelop the signature",
@@ -344,8 +221,8 @@ TEST(Verify, RefusesAnEnvelopedTransformWhoseReferenceDoesNotEnvelopTheSignature
 }
 
 TEST(Verify, RefusesAnEnvelopedTransformOfTheSignatureItself) {
-  const std::string uri = "#" + IdOf(GoodToken());
-  std::string text = Replaced(GoodToken(), uri, "#signature");
+  const std::string uri = "#" + IdOf(GenuineToken());
+  std::string text = Replaced(GenuineToken(), uri, "#signature");
   text = Replaced(text, "<ds:Signature ", "<ds:Signature Id=\"signature\" ");
   EXPECT_EQ(
       "The reference URI \"#signature\" has the enveloped-signature transform, but does not envelop the signature",
@@ -363,69 +240,48 @@ TEST(Verify, RefusesASignatureThatRemovesAllThatItCovers) {
   EXPECT_EQ("wrong", RefusalOf("<r>" + text + "</r>"));
 }
 
-/// The genuine token whose canonicalisation names that many prefixes, judged.
-std::string JudgePrefixes(std::size_t count, const std::string &separator) {
-  std::string list;
-  for (std::size_t number = 0; number < count; ++number) {
-    list += separator + "p" + std::to_string(number);
-  }
-  return Refusal(
-      EXCLUSIVE_TRANSFORM,
-      "<ds:Transform Algorithm=\"http://www.w3.org/2001/10/xml-exc-c14n#\"><InclusiveNamespaces PrefixList=\"" + list +
-          "\" xmlns=\"http://www.w3.org/2001/10/xml-exc-c14n#\"/></ds:Transform>");
-}
-
-TEST(Verify, AcceptsAtMost256InclusivePrefixes) {
-  const std::string refusal =
-      "The PrefixList of the algorithm \"http://www.w3.org/2001/10/xml-exc-c14n#\" has more than 256 prefixes";
-  EXPECT_EQ("wrong", JudgePrefixes(256, " ")); // accepted as an algorithm, and not what was signed
-  EXPECT_EQ("wrong", JudgePrefixes(256, "&#9; &#13;&#10;"));
-  EXPECT_EQ(refusal, JudgePrefixes(257, " "));
-  EXPECT_EQ(refusal, JudgePrefixes(1000, "&#10;"));
-}
-
-TEST(Verify, RefusesATreeWithoutCanonicalForm) {
+TEST(Verify, RefusesATreeWithoutACanonicalForm) {
   EXPECT_EQ(0u, Refusal("<saml:Subject>", "<saml:Subject><foo:bar/>").find("No canonical form: "));
 }
 
-// The signer signed the changed digest as well: else the signature value would be found wrong, and no digest compared.
+// The changed digests are signed too: otherwise the signature value would be wrong, and no digest would be compared.
 
-/// What becomes of the token whose digest was changed in that way.
-std::string JudgeResigned(const std::string &change) {
+/// The result for the token whose digest was changed in that way.
+std::string VerifyResigned(const std::string &change) {
   return RefusalOf(ReadDataFile("attacks/digest-resigned-" + change + ".xml"));
 }
 
 TEST(Verify, AcceptsAResignedTokenWhoseDigestIsUnchanged) {
-  EXPECT_EQ("accepted", JudgeResigned("unchanged"));
+  EXPECT_EQ("accepted", VerifyResigned("unchanged"));
 }
 
 TEST(Verify, AnswersFalseForASignedDigestThatIsTooShort) {
-  EXPECT_EQ("wrong", JudgeResigned("one-octet"));
-  EXPECT_EQ("wrong", JudgeResigned("31-octets"));
+  EXPECT_EQ("wrong", VerifyResigned("one-octet"));
+  EXPECT_EQ("wrong", VerifyResigned("31-octets"));
 }
 
 TEST(Verify, AnswersFalseForASignedDigestThatIsTooLong) {
-  EXPECT_EQ("wrong", JudgeResigned("one-octet-more"));
-  EXPECT_EQ("wrong", JudgeResigned("32-zeros-more"));
+  EXPECT_EQ("wrong", VerifyResigned("one-octet-more"));
+  EXPECT_EQ("wrong", VerifyResigned("32-zeros-more"));
 }
 
 TEST(Verify, AnswersFalseForASignedDigestOfWhichOneBitDiffers) {
-  EXPECT_EQ("wrong", JudgeResigned("first-bit"));
-  EXPECT_EQ("wrong", JudgeResigned("last-bit"));
+  EXPECT_EQ("wrong", VerifyResigned("first-bit"));
+  EXPECT_EQ("wrong", VerifyResigned("last-bit"));
 }
 
-TEST(Verify, LeavesCommentsOutOfWhatAReferenceCovers) {
+TEST(Verify, DoesNotCoverComments) {
   EXPECT_EQ("accepted", Refusal("<saml:Subject>", "<!-- not signed --><saml:Subject>"));
   std::string text = ReadDataFile("tokens/c14n-exclusive-with-comments.xml");
   EXPECT_EQ("accepted", RefusalOf(Replaced(text, "<saml:Subject>", "<!-- not signed --><saml:Subject>")));
 }
 
-TEST(Verify, CountsCDataAsText) {
+TEST(Verify, TreatsCDataAsText) {
   EXPECT_EQ("accepted", Refusal("alice@corp.example", "al<![CDATA[ice@corp]]>.example"));
 }
 
-TEST(Verify, TakesOutThisSignatureAndNoOther) {
-  const std::string text = GoodToken();
+TEST(Verify, RemovesThisSignatureAndNoOther) {
+  const std::string text = GenuineToken();
   const std::size_t begin = text.find("<ds:Signature ");
   const std::string signature = text.substr(begin, text.find("</ds:Signature>") + 15 - begin);
   EXPECT_EQ("wrong", Refusal("</saml:Assertion>", signature + "</saml:Assertion>"));
@@ -439,14 +295,14 @@ public:
   }
 };
 
-TEST(Verify, RaisesAFailureOfCryptographyAsItsOwnClass) {
+TEST(Verify, ThrowsItsOwnExceptionForAFailureOfCryptography) {
   std::set<std::string> uris;
-  EXPECT_THROWS_MESSAGE(SignatureOf(*ParseDocument(GoodToken()))->Verify(BrokenResolver(), uris), XmlSecurityException,
-                        "the key cannot be read");
+  EXPECT_THROWS_MESSAGE(SignatureOf(*ParseDocument(GenuineToken()))->Verify(BrokenResolver(), uris),
+                        XmlSecurityException, "the key cannot be read");
   EXPECT_TRUE(uris.empty());
 }
 
-/// A resolver of the host's own, which answers what it was given.
+/// A host's own resolver, which returns the given candidates.
 class PlainResolver final : public Tarvel::Xml::Security::KeyInfoResolver {
 public:
   explicit PlainResolver(CertificateList candidates) : m_candidates(std::move(candidates)) {}
@@ -456,18 +312,18 @@ private:
   const CertificateList m_candidates;
 };
 
-TEST(Verify, PassesOverCandidatesThatAreNull) {
+TEST(Verify, IgnoresNullCandidates) {
   Tarvel::Crypto::CertificateList candidates = Trusted({"sts-rsa"});
   candidates.insert(candidates.begin(), nullptr);
   candidates.push_back(nullptr);
   std::set<std::string> uris;
-  EXPECT_TRUE(SignatureOf(*ParseDocument(GoodToken()))->Verify(PlainResolver(candidates), uris));
+  EXPECT_TRUE(SignatureOf(*ParseDocument(GenuineToken()))->Verify(PlainResolver(candidates), uris));
 }
 
 TEST(Verify, KeepsTheTreeAliveAfterTheDocumentIsGone) {
   Tarvel::Ref<Tarvel::Xml::Security::Signature> signature;
   {
-    const auto document = ParseDocument(GoodToken());
+    const auto document = ParseDocument(GenuineToken());
     signature = SignatureOf(*document);
   }
   std::set<std::string> uris;
@@ -475,7 +331,7 @@ TEST(Verify, KeepsTheTreeAliveAfterTheDocumentIsGone) {
 }
 
 TEST(ParsedSignature, CanOnlyBeVerified) {
-  const auto signature = SignatureOf(*ParseDocument(GoodToken()));
+  const auto signature = SignatureOf(*ParseDocument(GenuineToken()));
   const std::string refusal = "A signature that was taken from a document can only be verified";
   EXPECT_THROWS_MESSAGE(signature->AddReference("", "", ""), Tarvel::InvalidStateException, refusal);
   EXPECT_THROWS_MESSAGE(signature->SetKeyInfo({}), Tarvel::InvalidStateException, refusal);

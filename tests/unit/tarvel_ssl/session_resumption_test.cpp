@@ -24,7 +24,7 @@ using Testing::TlsSettings;
 
 /// Sends the client how the server sees the handshake: "resumed" or "full".
 void ReportWhetherResumed(ServerConnection &connection) {
-  if (connection.ShakeHands()) {
+  if (connection.Handshake()) {
     connection.Write(connection.WasResumed() ? "resumed" : "full");
     connection.ReadSome();
   }
@@ -92,7 +92,7 @@ TEST_P(SessionResumption, ResumesASessionOnlyAfterItsConnectionHasEnded) {
 TEST_P(SessionResumption, ResumesNoSessionAfterAFatalAlert) {
   ScriptedServer corrupting(
       [](ServerConnection &connection) {
-        if (connection.ShakeHands() && connection.Write("full")) {
+        if (connection.Handshake() && connection.Write("full")) {
           connection.WriteRaw(std::string("\x17\x03\x03\x00\x20", 5) + std::string(32, 'x'));
           connection.ReadSome();
         }

@@ -35,7 +35,7 @@ using Testing::TlsClient;
 using Testing::TlsSettings;
 
 void Echo(ServerConnection &connection) {
-  if (!connection.ShakeHands()) {
+  if (!connection.Handshake()) {
     return;
   }
   for (std::string some = connection.ReadSome(); !some.empty(); some = connection.ReadSome()) {
@@ -68,7 +68,7 @@ TEST(SSLStream, SendsTheServerNameButNoAddress) {
   int next = 0;
   ScriptedServer server(
       [&](ServerConnection &connection) {
-        connection.ShakeHands();
+        connection.Handshake();
         names[next++].set_value(connection.GetServerName());
       },
       TlsSettings());
@@ -95,7 +95,7 @@ TEST(SSLStream, ChecksAddressesAgainstTheCertificate) {
 TEST(SSLStream, MovesLargeMessagesBothWays) {
   ScriptedServer server(
       [](ServerConnection &connection) {
-        connection.ShakeHands();
+        connection.Handshake();
         connection.Write(connection.ReadExactly(4u << 20));
       },
       TlsSettings());
@@ -118,7 +118,7 @@ TEST(SSLStream, MovesLargeMessagesBothWays) {
 TEST(SSLStream, ReadsTheClosingNoticeAsTheOrderlyEnd) {
   ScriptedServer server(
       [](ServerConnection &connection) {
-        connection.ShakeHands();
+        connection.Handshake();
         connection.Write("bye");
       },
       TlsSettings());
@@ -134,7 +134,7 @@ TEST(SSLStream, ReadsTheClosingNoticeAsTheOrderlyEnd) {
 TEST(SSLStream, ReportsAnEndWithoutClosingNoticeAsAFailure) {
   ScriptedServer server(
       [](ServerConnection &connection) {
-        connection.ShakeHands();
+        connection.Handshake();
         connection.Write("half");
         connection.CloseWithoutNotice();
       },
@@ -154,7 +154,7 @@ TEST(SSLStream, SendsTheClosingNoticeWhenItIsClosed) {
   std::promise<bool> noticed;
   ScriptedServer server(
       [&](ServerConnection &connection) {
-        connection.ShakeHands();
+        connection.Handshake();
         connection.Write("x");
         connection.ReadSome();
         noticed.set_value(connection.ReceivedClosingNotice());
@@ -318,7 +318,7 @@ TEST(SSLStream, ReadsBytesThatTheServerSentAfterAFailedWrite) {
   std::promise<void> failed;
   ScriptedServer server(
       [future = failed.get_future().share()](ServerConnection &connection) {
-        connection.ShakeHands();
+        connection.Handshake();
         future.wait_for(PATIENCE);
         connection.Write("413");
       },
@@ -336,7 +336,7 @@ TEST(SSLStream, ReportsTheFailedWriteWhenTheServerEndsWithoutNotice) {
   std::promise<void> failed;
   ScriptedServer server(
       [future = failed.get_future().share()](ServerConnection &connection) {
-        connection.ShakeHands();
+        connection.Handshake();
         future.wait_for(PATIENCE);
         connection.CloseWithoutNotice();
       },
@@ -368,7 +368,7 @@ TEST(SSLStream, ReportsThatACertificateIsRequired) {
   TlsSettings settings;
   settings.demandsClient = true;
   settings.minimumVersion = TLS1_3_VERSION;
-  ScriptedServer server([](ServerConnection &connection) { connection.ShakeHands(); }, settings);
+  ScriptedServer server([](ServerConnection &connection) { connection.Handshake(); }, settings);
   const BrokenConnection client(server.GetPort(), false);
   EXPECT_EQ(client.handshake.GetMessage(), "");
   EXPECT_EQ(client.Write("request"), "The TLS connection to localhost broke: Broken pipe");
@@ -402,7 +402,7 @@ TEST(SSLStream, RefusesAServerThatOffersOnlyOldTls) {
 TEST(SSLStream, ReportsACorruptRecordAsAFailure) {
   ScriptedServer server(
       [](ServerConnection &connection) {
-        connection.ShakeHands();
+        connection.Handshake();
         connection.WriteRaw(std::string("\x17\x03\x03\x00\x20", 5) + std::string(32, 'x'));
         connection.Stall();
       },
@@ -429,7 +429,7 @@ TEST(SSLStream, EndsAStalledHandshakeWhenItIsClosed) {
 TEST(SSLStream, EndsPendingReadsAndWritesOnceWhenItIsClosed) {
   ScriptedServer server(
       [](ServerConnection &connection) {
-        connection.ShakeHands();
+        connection.Handshake();
         connection.WaitForInterrupt();
       },
       TlsSettings());
@@ -492,7 +492,7 @@ TEST(SSLStream, RefusesReadsAndWritesBeforeTheHandshake) {
 TEST(SSLStream, RefusesASecondReadAtTheSameTime) {
   ScriptedServer server(
       [](ServerConnection &connection) {
-        connection.ShakeHands();
+        connection.Handshake();
         connection.WaitForInterrupt();
       },
       TlsSettings());

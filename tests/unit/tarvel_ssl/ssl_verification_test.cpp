@@ -29,7 +29,7 @@ using Testing::TlsSettings;
 constexpr int VERSIONS[] = {TLS1_2_VERSION, TLS1_3_VERSION};
 
 void Answer(ServerConnection &connection) {
-  if (connection.ShakeHands()) {
+  if (connection.Handshake()) {
     connection.Write(connection.GetClientName() + "!");
     connection.ReadSome();
   }

@@ -22,16 +22,16 @@ std::string WriteAgain(const std::string &text) {
   return WriteElement(*ParseDocument(text)->GetDocumentElement());
 }
 
-TEST(WriteTo, EscapesWhatTextMustNotHold) {
+TEST(WriteTo, EscapesSpecialCharactersInText) {
   EXPECT_EQ(WriteAgain("<a>&lt;&gt;&amp;\"'&#xD;\n\t</a>"), "<a>&lt;&gt;&amp;\"'&#xD;\n\t</a>");
 }
 
-TEST(WriteTo, EscapesWhatAttributeValuesMustNotHold) {
+TEST(WriteTo, EscapesSpecialCharactersInAttributeValues) {
   EXPECT_EQ(WriteAgain("<a x='&lt;>&amp;\"&apos;&#xD;&#xA;&#x9; '/>"),
             "<a x=\"&lt;>&amp;&quot;'&#xD;&#xA;&#x9; \"></a>");
 }
 
-TEST(WriteTo, KeepsPrefixesDeclarationsAndTheirOrderAsTheyStand) {
+TEST(WriteTo, KeepsPrefixesDeclarationsAndTheirOrder) {
   const std::string text =
       "<p:a z=\"1\" xmlns:q=\"urn:p\" xmlns=\"\" xmlns:p=\"urn:p\" q:y=\"2\"><p:b xmlns:p=\"urn:p\"></p:b></p:a>";
   EXPECT_EQ(WriteAgain(text), text);
@@ -45,7 +45,7 @@ TEST(WriteTo, WritesCDataAsText) {
   EXPECT_EQ(WriteAgain("<a><![CDATA[<b>&amp;]]></a>"), "<a>&lt;b&gt;&amp;amp;</a>");
 }
 
-TEST(WriteTo, WritesTheElementAloneAndNotItsSiblings) {
+TEST(WriteTo, WritesTheElementWithoutItsSiblings) {
   const auto document = ParseDocument("<a>one<b x='1'><c/>two</b>three<d/></a>");
   EXPECT_EQ(WriteElement(*document->GetDocumentElement()->FindChildElement("b")), "<b x=\"1\"><c></c>two</b>");
 }
@@ -55,7 +55,7 @@ TEST(WriteTo, WritesMoreThanItsBufferHolds) {
   EXPECT_TRUE(WriteAgain(text) == text);
 }
 
-TEST(WriteTo, WritesPiecesOfEveryLengthAroundThatOfItsBuffer) {
+TEST(WriteTo, WritesPiecesOfEveryLengthAroundTheSizeOfItsBuffer) {
   for (const std::size_t around : {8192U, 16384U}) {
     for (std::size_t length = around - 20; length <= around + 20; ++length) {
       const std::string text = "<a><b>" + std::string(length, 'x') + "</b><c>" + std::string(10'000, 'y') + "</c></a>";
@@ -82,7 +82,7 @@ TEST(WriteTo, WritesTextAndAttributeValuesAsReferencesWhenAskedTo) {
             "<a x=\"&#xFC;&amp;&#x142; &#x1F600;\">\x7F&#x80;&lt;&#x8A9E;&#xFFFD;&#x10FFFF;z</a>");
 }
 
-TEST(WriteTo, LeavesNamesCommentsAndInstructionsAsTheyAreWhenAskedForReferences) {
+TEST(WriteTo, WritesNamesCommentsAndInstructionsAsUtf8WhenAskedForReferences) {
   const std::string text =
       "<\xC3\xBC:a xmlns:\xC3\xBC=\"urn:u\" \xC3\xA4=\"1\"><!-- \xC3\xB6 --><?\xC3\xBC \xC3\xA4?></\xC3\xBC:a>";
   EXPECT_EQ(WriteInAscii(*ParseDocument(text)->GetDocumentElement()), text);
@@ -99,19 +99,20 @@ TEST(WriteTo, WritesMoreReferencesThanItsBufferHolds) {
   EXPECT_TRUE(WriteInAscii(*document->GetDocumentElement()) == "<a>" + references + "</a>");
 }
 
-TEST(WriteTo, WritesAReferenceWhereverInATextItsCharacterIs) {
+TEST(WriteTo, WritesAReferenceAtEveryPositionOfAText) {
   struct Case {
     std::string_view character;
     std::string_view inText;
     std::string_view inAttributes;
   };
+  constexpr std::size_t LENGTH = 36; // two blocks of 16 bytes, which are checked at once, and a rest
   constexpr Case CASES[] = {{"&", "&amp;", "&amp;"}, {"<", "&lt;", "&lt;"},    {">", "&gt;", ">"},
                             {"\"", "\"", "&quot;"},  {"\r", "&#xD;", "&#xD;"}, {"\t", "\t", "&#x9;"},
                             {"\n", "\n", "&#xA;"},   {"\x7F", "\x7F", "\x7F"}, {"\xC3\xBC", "&#xFC;", "&#xFC;"}};
   for (const Case &tried : CASES) {
-    for (std::size_t before = 0; before < 20; ++before) {
+    for (std::size_t before = 0; before < LENGTH; ++before) {
       const std::string begin(before, 'x');
-      const std::string end(20 - before, '!');
+      const std::string end(LENGTH - before, '!');
       Ref<ElementNode> element;
       CreateElementNode("", "a", element);
       Ref<TextNode> text;
@@ -138,7 +139,7 @@ const char *const TEXTS[] = {"",
                              "\xF0\x9F\x98\x80\xF0\x9F\x91\xA8\xE2\x80\x8D\xF0\x9F\x91\xA9",
                              "\x7F\xC2\x80\xC2\x85\xE2\x80\xA8\xEF\xBF\xBD\xEE\x80\x80"};
 
-TEST(WriteTo, CarriesEachTextThroughAParserUnchanged) {
+TEST(WriteTo, WritesEachTextSoThatAParserReturnsIt) {
   for (const char *const text : TEXTS) {
     Ref<ElementNode> element;
     Ref<TextNode> node;
@@ -156,7 +157,7 @@ TEST(WriteTo, CarriesEachTextThroughAParserUnchanged) {
   }
 }
 
-TEST(WriteTo, CarriesEveryAsciiCharacterThroughAParserUnchanged) {
+TEST(WriteTo, WritesEachAsciiCharacterSoThatAParserReturnsIt) {
   for (char c = 1; c < 0x7F; ++c) {
     if (c < 0x20 && c != '\t' && c != '\n' && c != '\r') {
       continue;
@@ -172,7 +173,7 @@ TEST(WriteTo, CarriesEveryAsciiCharacterThroughAParserUnchanged) {
   }
 }
 
-TEST(WriteTo, GivesTheSameTreeBackForEachToken) {
+TEST(WriteTo, WritesEachTokenSoThatAParserReturnsItsTree) {
   std::size_t tokens = 0;
   for (const auto &entry : std::filesystem::directory_iterator(::Testing::DataPath("tokens"))) {
     if (entry.path().extension() != ".xml") {

@@ -23,7 +23,7 @@ std::string DescribeDocument(const std::string &text) {
   return DescribeTree(*ParseDocument(text)->GetDocumentNode());
 }
 
-TEST(ParseDocument, HandsOutElementsAttributesAndTextInOrder) {
+TEST(ParseDocument, ReadsElementsAttributesAndTextInOrder) {
   EXPECT_EQ(DescribeDocument("<a x=\"1\" y='2'>one<b/>two<c>three</c></a>"),
             "(1:a @1:x=1:1 @1:y=1:2 text=3:one(1:b) text=3:two(1:c text=5:three))");
 }
@@ -91,7 +91,7 @@ TEST(ParseDocument, AcceptsNamesBeyondAscii) {
             "(6:\xC3\xA4:\xE4\xB8\x80 @8:xmlns:\xC3\xA4=5:urn:x @4:\xCE\xB1\xC2\xB7=1:1)");
 }
 
-TEST(ParseDocument, AcceptsAByteOrderMarkAndCountsColumnsBehindIt) {
+TEST(ParseDocument, AcceptsAByteOrderMarkAndCountsColumnsAfterIt) {
   const auto document = ParseDocument("\xEF\xBB\xBF<?xml version='1.0' encoding='UTF-8'?><a/>");
   EXPECT_EQ(document->GetDocumentElement()->GetLine(), 1u);
   EXPECT_EQ(document->GetDocumentElement()->GetColumn(), 39u);
@@ -103,12 +103,12 @@ TEST(ParseDocument, AcceptsUtf8AndUsAsciiInAnyLetterCase) {
   }
 }
 
-TEST(ParseDocument, LeavesAnEncodingNamedInAnInstructionOrInTextAlone) {
+TEST(ParseDocument, IgnoresAnEncodingInAnInstructionOrInText) {
   EXPECT_EQ(DescribeDocument("<?xml-stylesheet encoding='UTF-16'?><a>encoding='UTF-16'</a>"),
             " pi=14:xml-stylesheet?17:encoding='UTF-16'(1:a text=17:encoding='UTF-16')");
 }
 
-TEST(ParseDocument, KnowsLineAndColumnInBytesOfEachElement) {
+TEST(ParseDocument, ReportsLineAndColumnInBytesOfEachElement) {
   const auto document = ParseDocument("<?xml version='1.0'?>\n<a\n x='1'>\xC3\xA4<b/>\r\n  <c\n\n/><d\ny='>'/></a>");
   const ElementNode &a = *document->GetDocumentElement();
   const auto position = [&a](std::string_view name) {
@@ -140,7 +140,7 @@ TEST(XMLParser, ReadsOneDocumentAfterAnother) {
   EXPECT_EQ(DescribeTree(*CheckedCast<Document>(third)->GetDocumentNode()), "(1:c text=1:3)");
 }
 
-/// Hands out its text in small pieces, and then fails if it is to.
+/// Returns its text in small pieces, and then fails if `fails` is set.
 class SlowReader final : public Reader {
 public:
   SlowReader(std::string text, bool fails) : m_text(std::move(text)), m_fails(fails) {}
@@ -202,7 +202,7 @@ private:
   const std::string m_event;
 };
 
-TEST(XMLParser, HandsEventsToItsHandlerAndReturnsItsResult) {
+TEST(XMLParser, PassesEventsToItsHandlerAndReturnsItsResult) {
   const Ref<ThrowingHandler> handler = MakeRef<ThrowingHandler>("");
   EXPECT_FALSE(CreateXMLParser(handler)->Parse(*CreateStringReader("<a>t<!--c--><?p?><b/></a>")));
   EXPECT_EQ(handler->seen,
@@ -228,7 +228,7 @@ TEST(XMLParser, PrintsNothing) {
     try {
       ParseDocument(text);
     } catch (const XMLParseException &) {
-      continue; // what is refused is told elsewhere
+      continue; // the messages are tested elsewhere
     }
   }
   EXPECT_EQ(::testing::internal::GetCapturedStderr(), "");

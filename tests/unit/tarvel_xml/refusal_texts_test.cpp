@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
-// Each reason for which a document is refused: its text, the place of the first byte that is wrong, and its row in the
-// page that users look it up in.
+// Each reason for refusing a document: its text, the position of the first wrong byte, and its row in the troubleshooting
+// page.
 
 #include "xml/refusals.h"
 
@@ -49,7 +49,7 @@ std::string Numbered(const std::string &before, std::size_t count, const std::st
   return text;
 }
 
-/// The text of a reason with what was found in its numbered places.
+/// The text of a refusal, with `found` in its numbered places.
 std::string FillIn(Refusal refusal, const std::vector<std::string> &found) {
   std::string text(REFUSAL_TEXTS[static_cast<std::size_t>(refusal)]);
   for (std::size_t i = 0; i < found.size(); ++i) {
@@ -223,7 +223,7 @@ std::vector<Case> GetCases() {
   };
 }
 
-TEST(Refusals, HaveATextAndThePlaceOfTheFirstByteThatIsWrong) {
+TEST(Refusals, HaveATextAndThePositionOfTheFirstWrongByte) {
   for (const Case &refused : GetCases()) {
     SCOPED_TRACE(refused.document.substr(0, 100));
     EXPECT_THROWS_MESSAGE(ParseDocument(refused.document), XMLParseException,
@@ -240,7 +240,7 @@ TEST(Refusals, AreAllTested) {
   EXPECT_EQ(tested.size(), REFUSAL_COUNT);
 }
 
-TEST(Refusals, HaveTextsThatDiffer) {
+TEST(Refusals, HaveDifferentTexts) {
   const std::set<std::string_view> texts(std::begin(REFUSAL_TEXTS), std::end(REFUSAL_TEXTS));
   EXPECT_EQ(texts.size(), REFUSAL_COUNT);
 }
@@ -269,7 +269,7 @@ TEST(Refusals, AreListedForUsersInTheOrderOfTheCode) {
   EXPECT_EQ(ReadMessages(ReadDataFile("../../docs/troubleshooting.md"), "## The document ("), texts);
 }
 
-TEST(Refusals, ReportTheFirstOfManyAttributesThatOccursTwice) {
+TEST(Refusals, ReportTheFirstDuplicateOfManyAttributes) {
   const std::string many = Numbered(" x", 20, "=''");
   EXPECT_THROWS_MESSAGE(ParseDocument("<a" + many + "\nx7=''\nx3=''/>"), XMLParseException,
                         "the attribute 'x7' occurs twice at line 2, column 1");
@@ -277,7 +277,7 @@ TEST(Refusals, ReportTheFirstOfManyAttributesThatOccursTwice) {
                         "the attribute 'x7' occurs twice at line 2, column 1");
 }
 
-TEST(Refusals, ReportTheFirstAttributeWhoseNamespaceAndLocalNameAnotherHas) {
+TEST(Refusals, ReportTheFirstAttributeWithTheNamespaceAndLocalNameOfAnother) {
   for (const std::string &more : {""s, Numbered(" x", 20, "=''")}) {
     const std::string start = "<a xmlns:p='u' xmlns:q='v' xmlns:r='v' xmlns:s='u'" + more;
     EXPECT_NO_THROW(ParseDocument(start + " o:y='' p:y='' q:y='' y=''/>"));
@@ -291,7 +291,7 @@ TEST(Refusals, ReportTheFirstAttributeWhoseNamespaceAndLocalNameAnotherHas) {
   }
 }
 
-TEST(Refusals, AreNotForWhatOnlyLooksAlike) {
+TEST(Refusals, DoNotConcernWhatOnlyLooksWrong) {
   // Different namespaces, unbound prefixes, and a default namespace, which attributes do not have.
   const std::string many = Numbered(" x", 20, "=''");
   for (const std::string &more : {""s, many}) {

@@ -32,19 +32,19 @@ void ExpectRefused(const std::vector<Refused> &cases) {
   }
 }
 
-TEST(XMLParseException, TellsLineAndColumn) {
-  const XMLParseException exception("no good", 3, 14);
-  EXPECT_STREQ(exception.what(), "no good at line 3, column 14");
+TEST(XMLParseException, ReportsLineAndColumn) {
+  const XMLParseException exception("not readable", 3, 14);
+  EXPECT_STREQ(exception.what(), "not readable at line 3, column 14");
   EXPECT_EQ(exception.GetLine(), 3u);
   EXPECT_EQ(exception.GetColumn(), 14u);
 }
 
 TEST(XMLParseException, KeepsItsClassAndPlaceWhenClonedAndThrown) {
-  const std::unique_ptr<Exception> clone(XMLParseException("no good", 3, 14).Clone());
+  const std::unique_ptr<Exception> clone(XMLParseException("not readable", 3, 14).Clone());
   try {
     clone->Throw();
   } catch (const XMLParseException &thrown) {
-    EXPECT_STREQ(thrown.what(), "no good at line 3, column 14");
+    EXPECT_STREQ(thrown.what(), "not readable at line 3, column 14");
     EXPECT_EQ(thrown.GetLine(), 3u);
     return;
   }
@@ -187,7 +187,7 @@ TEST(ParseDocument, RefusesWhatIsNotWellFormed) {
   });
 }
 
-TEST(ParseDocument, RefusesNamespaceErrorsButUnboundPrefixes) {
+TEST(ParseDocument, RefusesNamespaceErrorsExceptUnboundPrefixes) {
   ExpectRefused({
       {"<a xmlns:p='' p:x='1'/>", "the prefix 'p' is bound to the empty namespace name at line 1, column 4"},
       {"<a xmlns:p='urn:a' xmlns:p='urn:b'/>", "the attribute 'xmlns:p' occurs twice at line 1, column 20"},
@@ -210,7 +210,7 @@ TEST(ParseDocument, RefusesNamespaceErrorsButUnboundPrefixes) {
   });
 }
 
-TEST(ParseDocument, ShortensWhatItFoundBetweenTwoCharacters) {
+TEST(ParseDocument, ShortensWhatItFoundAtACharacterBoundary) {
   std::string name = "x";
   for (int i = 0; i < 5000; ++i) {
     name += "\xC3\xA4";
@@ -244,7 +244,7 @@ TEST(ParseDocument, RefusesEveryPrefixOfAToken) {
   }
 }
 
-TEST(ParseDocument, EndsInATreeOrItsExceptionForEveryChangedByteOfAToken) {
+TEST(ParseDocument, ParsesOrThrowsItsExceptionForEveryChangedByteOfAToken) {
   std::string token = ReadDataFile("tokens/bearer.xml");
   ASSERT_FALSE(token.empty());
   std::size_t refused = 0;
@@ -262,7 +262,7 @@ TEST(ParseDocument, EndsInATreeOrItsExceptionForEveryChangedByteOfAToken) {
     }
     token[offset] = original;
   }
-  EXPECT_GE(refused, 3 * token.size()); // null, half a character and "&" fit nowhere, "<" hardly anywhere
+  EXPECT_GE(refused, 3 * token.size()); // null, half a character and "&" are allowed nowhere, "<" hardly anywhere
 }
 
 } // namespace

@@ -1,5 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
-// The records of an assertion: aggregates, whose fields are in the order of the elements and attributes that they come from.
+// The records of an assertion are aggregates. Their fields are in the order of the elements and attributes of the schema.
 #include "token/assertion_model.h"
 
 #include "support/declared_order.h"

@@ -18,7 +18,7 @@ namespace {
 using namespace SsoClient;
 using namespace Testing;
 
-/// One change of a good assertion, and what it is refused with.
+/// A change of a valid assertion, and the message with which it is refused.
 struct Refusal {
   std::string from;
   std::string to;
@@ -32,11 +32,11 @@ void Parse(const std::string &text) {
   ParseSamlAssertionElement(iterator, assertion);
 }
 
-void ExpectRefusals(const std::string &good, const std::vector<Refusal> &refusals) {
-  ASSERT_NO_THROW(Parse(good));
+void ExpectRefusals(const std::string &valid, const std::vector<Refusal> &refusals) {
+  ASSERT_NO_THROW(Parse(valid));
   for (const Refusal &refusal : refusals) {
     SCOPED_TRACE("replaced " + refusal.from + "\nby " + refusal.to);
-    EXPECT_THROWS_MESSAGE(Parse(ReplaceOnce(good, refusal.from, refusal.to)), ParseException, refusal.message);
+    EXPECT_THROWS_MESSAGE(Parse(ReplaceOnce(valid, refusal.from, refusal.to)), ParseException, refusal.message);
   }
 }
 
@@ -54,7 +54,7 @@ std::string OnlyText(const std::string &name) {
 
 const std::string UNKNOWN_RESTRICTION = "Unknown or duplicate restriction node under Conditions";
 
-TEST(AssertionRefusals, RootThatIsNoAssertion) {
+TEST(AssertionRefusals, RootThatIsNotAnAssertion) {
   EXPECT_THROWS_MESSAGE(Parse("<r/>"), ParseException, "Expected element 'Assertion' not found.");
   EXPECT_THROWS_MESSAGE(Parse("<Assertion/>"), ParseException, "Element 'Assertion' has unexpected namespace");
   EXPECT_THROWS_MESSAGE(Parse("<saml:Assertion xmlns:saml='urn:oasis:names:tc:SAML:1.0:assertion'/>"), ParseException,
@@ -225,35 +225,35 @@ TEST(AssertionRefusals, HolderOfKeyData) {
   const std::string type = " xsi:type=\"saml:KeyInfoConfirmationDataType\"";
   const std::string end = "</saml:SubjectConfirmationData>";
   const std::string where = "Element saml:SubjectConfirmationDataat 1,";
-  const std::string good = HolderOfKeyAssertion();
-  const std::size_t column = good.find("<saml:SubjectConfirmationData") + 1;
-  ExpectRefusals(good, {
-                           {type, "",
-                            "Node 'saml:SubjectConfirmationData is missing required attribute "
-                            "'{http://www.w3.org/2001/XMLSchema-instance}type'"},
-                           {type, " type=\"saml:KeyInfoConfirmationDataType\"",
-                            "Unexpected attribute 'type' on element 'saml:SubjectConfirmationData'"},
-                           {type, type + " NotOnOrAfter=\"2026-01-01T08:00:00Z\"",
-                            "Unexpected attribute 'NotOnOrAfter' on element 'saml:SubjectConfirmationData'"},
-                           {type, type + " saml:NotOnOrAfter=\"\"",
-                            "Unexpected attribute '{urn:oasis:names:tc:SAML:2.0:assertion}NotOnOrAfter' on element "
-                            "'saml:SubjectConfirmationData'"},
-                           {type, " xsi:type=\"p:KeyInfoConfirmationDataType\"",
-                            where + std::to_string(column) + " uses undefined prefix: `p'"},
-                           {type, " p:type=\"saml:KeyInfoConfirmationDataType\"",
-                            where + std::to_string(column) + " uses undefined prefix: `p'"},
-                           {type, " xsi:type=\"saml:SubjectConfirmationDataType\"",
-                            "Invalid SubjectConfirmationData type: 'saml:SubjectConfirmationDataType'"},
-                           {type, " xsi:type=\"KeyInfoConfirmationDataType\"",
-                            "Invalid SubjectConfirmationData type: 'KeyInfoConfirmationDataType'"},
-                           {type, " xsi:type=\"\"", "Invalid SubjectConfirmationData type: ''"},
-                           {end, "<ds:KeyInfo/>" + end, "Unexpected elements after SubjectConfirmationData/KeyInfo"},
-                           {end, "text" + end, "Unexpected elements after SubjectConfirmationData/KeyInfo"},
-                           {end, end + "<saml:NameID/>", "Unexpected elements after SubjectConfirmationData"},
-                           {"<ds:KeyInfo>", "<saml:Extra/><ds:KeyInfo>", NotFound("KeyInfo")},
-                           {"<saml:SubjectConfirmationData", "<saml:SubjectConfirmationData xmlns:saml=\"urn:other\"",
-                            "Element 'saml:SubjectConfirmationData' has unexpected namespace"},
-                       });
+  const std::string valid = HolderOfKeyAssertion();
+  const std::size_t column = valid.find("<saml:SubjectConfirmationData") + 1;
+  ExpectRefusals(valid, {
+                            {type, "",
+                             "Node 'saml:SubjectConfirmationData is missing required attribute "
+                             "'{http://www.w3.org/2001/XMLSchema-instance}type'"},
+                            {type, " type=\"saml:KeyInfoConfirmationDataType\"",
+                             "Unexpected attribute 'type' on element 'saml:SubjectConfirmationData'"},
+                            {type, type + " NotOnOrAfter=\"2026-01-01T08:00:00Z\"",
+                             "Unexpected attribute 'NotOnOrAfter' on element 'saml:SubjectConfirmationData'"},
+                            {type, type + " saml:NotOnOrAfter=\"\"",
+                             "Unexpected attribute '{urn:oasis:names:tc:SAML:2.0:assertion}NotOnOrAfter' on element "
+                             "'saml:SubjectConfirmationData'"},
+                            {type, " xsi:type=\"p:KeyInfoConfirmationDataType\"",
+                             where + std::to_string(column) + " uses undefined prefix: `p'"},
+                            {type, " p:type=\"saml:KeyInfoConfirmationDataType\"",
+                             where + std::to_string(column) + " uses undefined prefix: `p'"},
+                            {type, " xsi:type=\"saml:SubjectConfirmationDataType\"",
+                             "Invalid SubjectConfirmationData type: 'saml:SubjectConfirmationDataType'"},
+                            {type, " xsi:type=\"KeyInfoConfirmationDataType\"",
+                             "Invalid SubjectConfirmationData type: 'KeyInfoConfirmationDataType'"},
+                            {type, " xsi:type=\"\"", "Invalid SubjectConfirmationData type: ''"},
+                            {end, "<ds:KeyInfo/>" + end, "Unexpected elements after SubjectConfirmationData/KeyInfo"},
+                            {end, "text" + end, "Unexpected elements after SubjectConfirmationData/KeyInfo"},
+                            {end, end + "<saml:NameID/>", "Unexpected elements after SubjectConfirmationData"},
+                            {"<ds:KeyInfo>", "<saml:Extra/><ds:KeyInfo>", NotFound("KeyInfo")},
+                            {"<saml:SubjectConfirmationData", "<saml:SubjectConfirmationData xmlns:saml=\"urn:other\"",
+                             "Element 'saml:SubjectConfirmationData' has unexpected namespace"},
+                        });
 }
 
 TEST(AssertionRefusals, KeyInfoOfHolderOfKey) {
@@ -344,10 +344,10 @@ TEST(AssertionRefusals, UnknownAndDuplicateRestrictions) {
 }
 
 TEST(AssertionRefusals, ConditionWhoseTypeUsesAnUndefinedPrefix) {
-  const std::string good = BearerAssertion();
-  const std::size_t column = good.find("<saml:ProxyRestriction") + 1;
-  ExpectRefusals(good, {{Piece::PROXY_RESTRICTION, "<saml:Condition xsi:type=\"p:T\"/>",
-                         "Element saml:Conditionat 1," + std::to_string(column) + " uses undefined prefix: `p'"}});
+  const std::string valid = BearerAssertion();
+  const std::size_t column = valid.find("<saml:ProxyRestriction") + 1;
+  ExpectRefusals(valid, {{Piece::PROXY_RESTRICTION, "<saml:Condition xsi:type=\"p:T\"/>",
+                          "Element saml:Conditionat 1," + std::to_string(column) + " uses undefined prefix: `p'"}});
 }
 
 TEST(AssertionRefusals, DelegationRestriction) {

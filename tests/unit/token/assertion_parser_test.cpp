@@ -112,7 +112,7 @@ TEST(ParseSamlAssertionElement, ReadsStatements) {
   EXPECT_TRUE(attributes[1].values.empty());
 }
 
-TEST(ParseSamlAssertionElement, MakesRoomForItsAttributesOnce) {
+TEST(ParseSamlAssertionElement, ReservesMemoryForItsAttributesOnce) {
   std::string attributes;
   for (int i = 0; i < 5; ++i) {
     attributes += "<saml:Attribute Name=\"urn:one\"/> ";
@@ -122,7 +122,7 @@ TEST(ParseSamlAssertionElement, MakesRoomForItsAttributesOnce) {
   EXPECT_EQ(5u, assertion.AttributeStatement->attributes.capacity());
 }
 
-TEST(ParseAttributeStatementElement, MakesNoRoomForElementsThatCannotBeAttributes) {
+TEST(ParseAttributeStatementElement, ReservesNoMemoryForElementsThatCannotBeAttributes) {
   std::string text = "<saml:AttributeStatement xmlns:saml=\"urn:oasis:names:tc:SAML:2.0:assertion\">";
   for (int i = 0; i < 100; ++i) {
     text += "<saml:Attribute/>";
@@ -132,7 +132,7 @@ TEST(ParseAttributeStatementElement, MakesNoRoomForElementsThatCannotBeAttribute
   AttributeStatementType statement;
   EXPECT_THROWS_MESSAGE(ParseAttributeStatementElement(iterator, statement), ParseException,
                         "Node 'saml:Attribute is missing required attribute 'Name'");
-  EXPECT_LE(statement.attributes.capacity(), 1u); // for the one that was being read
+  EXPECT_LE(statement.attributes.capacity(), 1u); // for the attribute that was being read
 }
 
 TEST(ParseSamlAssertionElement, LeavesAdviceAndAttributesEmptyWhenTheyAreAbsent) {
@@ -158,7 +158,7 @@ TEST(ParseSamlAssertionElement, LeavesCountsEmptyWhenTheyAreAbsent) {
   EXPECT_FALSE(conditions.RenewRestriction->Count);
 }
 
-TEST(ParseSamlAssertionElement, TakesEmptyAdviceAndEmptyAttributeStatement) {
+TEST(ParseSamlAssertionElement, AcceptsEmptyAdviceAndAnEmptyAttributeStatement) {
   std::string text = ReplaceOnce(BearerAssertion(), Piece::RSA_ADVICE, "");
   text = ReplaceOnce(text, Piece::ATTRIBUTES, "");
   const SamlAssertionType assertion = Parse(text);
@@ -194,7 +194,7 @@ TEST(ParseSamlAssertionElement, IgnoresACommentBetweenIssuerAndSignature) {
   EXPECT_EQ("the issuer", Parse(text).Issuer.value);
 }
 
-TEST(ParseSamlAssertionElement, TakesRestrictionsInAnyOrder) {
+TEST(ParseSamlAssertionElement, AcceptsRestrictionsInAnyOrder) {
   const std::vector<std::string> restrictions{Piece::DelegationRestriction(), Piece::AudienceRestriction(),
                                               Piece::PROXY_RESTRICTION, Piece::RENEW_RESTRICTION};
   std::vector<std::size_t> order{0, 1, 2, 3};
@@ -214,7 +214,7 @@ TEST(ParseSamlAssertionElement, TakesRestrictionsInAnyOrder) {
   } while (std::next_permutation(order.begin(), order.end()));
 }
 
-TEST(ParseSamlAssertionElement, DoesNotCareForPrefixes) {
+TEST(ParseSamlAssertionElement, AcceptsAnyPrefixes) {
   std::string text = HolderOfKeyAssertion();
   for (std::size_t position; (position = text.find("saml:")) != std::string::npos;) {
     text.erase(position, 5);
@@ -223,12 +223,12 @@ TEST(ParseSamlAssertionElement, DoesNotCareForPrefixes) {
   EXPECT_EQ("alice@corp", Parse(text).Subject.NameID.value);
 }
 
-TEST(ParseSamlAssertionElement, KeepsTextsAsTheyStand) {
+TEST(ParseSamlAssertionElement, KeepsTextsUnchanged) {
   const std::string text = ReplaceOnce(BearerAssertion(), ">alice@corp<", "> al&lt;ce@<![CDATA[corp&]]>\n<");
   EXPECT_EQ(" al<ce@corp&\n", Parse(text).Subject.NameID.value);
 }
 
-TEST(ParseSamlAssertionElement, LetsAnAttributeValueSayItsType) {
+TEST(ParseSamlAssertionElement, AcceptsAnAttributeValueWithAType) {
   for (const char *const type :
        {"xsi:type=\"xs:string\"", "xmlns:i=\"http://www.w3.org/2001/XMLSchema-instance\" i:type=\"\"",
         "xmlns:xs=\"http://www.w3.org/2001/XMLSchema\" xsi:type=\"xs:string\"", "xmlns:x=\"urn:x\""}) {
@@ -238,7 +238,7 @@ TEST(ParseSamlAssertionElement, LetsAnAttributeValueSayItsType) {
   }
 }
 
-TEST(ParseSamlAssertionElement, MovesOnToTheNextNode) {
+TEST(ParseSamlAssertionElement, MovesTheCursorToTheNextNode) {
   const ParsedDocument document("<r>" + HolderOfKeyAssertion() + " <!-- note --><next/></r>");
   NodeFilterIterator iterator = document.Cursor().GetChild();
   SamlAssertionType assertion;

@@ -1,7 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// Assertions as text, in pieces that a test can leave out, repeat or change. Their signatures are well-formed and sign
-/// nothing.
+/// Assertions as text, in pieces that a test can leave out, repeat or change. Their signatures are well-formed, but do
+/// not sign anything.
 
 #pragma once
 
@@ -13,7 +13,7 @@
 
 namespace Testing {
 
-/// `text` with `from` replaced by `to`. @throws std::logic_error unless `from` is there exactly once.
+/// `text` with `from` replaced by `to`. @throws std::logic_error unless `from` occurs exactly once.
 inline std::string ReplaceOnce(const std::string &text, const std::string &from, const std::string &to) {
   const std::size_t position = text.find(from);
   if (position == std::string::npos || text.find(from, position + 1) != std::string::npos) {
@@ -122,7 +122,7 @@ inline std::string AttributeStatement() {
 
 } // namespace Piece
 
-/// An assertion of these children.
+/// An assertion with these children.
 inline std::string Assertion(const std::vector<std::string> &children) {
   std::string text = Piece::START;
   for (const std::string &child : children) {
@@ -131,13 +131,13 @@ inline std::string Assertion(const std::vector<std::string> &children) {
   return text + Piece::END;
 }
 
-/// A bearer token with everything that an assertion may have.
+/// A bearer token with all optional parts.
 inline std::string BearerAssertion() {
   return Assertion({Piece::ISSUER, Piece::SIGNATURE, Piece::BearerSubject(), Piece::AllConditions(), Piece::Advice(),
                     Piece::AuthnStatement(), Piece::AttributeStatement()});
 }
 
-/// A holder-of-key token with no more than an assertion must have.
+/// A holder-of-key token without optional parts.
 inline std::string HolderOfKeyAssertion() {
   return Assertion(
       {Piece::ISSUER, Piece::SIGNATURE, Piece::HolderOfKeySubject(), Piece::Conditions(""), Piece::AuthnStatement()});

@@ -45,7 +45,7 @@ private:
   Tarvel::ScopedEnvironment m_clock{{[] { return DateTime("2026-01-02T03:04:05Z").GetUtcTime(); }, {}}};
 };
 
-TEST_F(CreateSamlTokenTest, AnswersWhatAFullTokenSays) {
+TEST_F(CreateSamlTokenTest, ReadsAFullToken) {
   const auto token = CreateSamlToken(Fixture("full"), Trusted());
   EXPECT_EQ("_a18b869b-2e81-c0c5-2955-2a3c4fa5c92e", token->GetId());
   EXPECT_EQ(DateTime("2020-01-01T00:00:00Z"), token->GetStartDate());
@@ -59,7 +59,7 @@ TEST_F(CreateSamlTokenTest, AnswersWhatAFullTokenSays) {
   EXPECT_EQ("CN=holder,O=Example", token->GetConfirmationCertificate()->GetSubject());
 }
 
-TEST_F(CreateSamlTokenTest, ReplacesWhatTheCallersRecordsHeld) {
+TEST_F(CreateSamlTokenTest, ReplacesTheValuesOfTheCallersVariables) {
   const auto token = CreateSamlToken(Fixture("full"), Trusted());
   std::pair<std::string, std::string> fullName{"before", "before"};
   token->GetFullName(fullName);
@@ -77,7 +77,7 @@ TEST_F(CreateSamlTokenTest, ReplacesWhatTheCallersRecordsHeld) {
   EXPECT_EQ((std::set<std::string>{"https://files.corp.example/", "https://mail.corp.example/"}), audience);
 }
 
-TEST_F(CreateSamlTokenTest, AnswersDelegationChainAndAdviceInOrder) {
+TEST_F(CreateSamlTokenTest, ReadsDelegationChainAndAdviceInOrder) {
   const auto token = CreateSamlToken(Fixture("full"), Trusted());
   std::vector<Delegate> chain{Delegate()};
   token->GetDelegationChain(chain);
@@ -98,7 +98,7 @@ TEST_F(CreateSamlTokenTest, AnswersDelegationChainAndAdviceInOrder) {
   EXPECT_EQ("urn:corp.example:audit", advice[1].source);
 }
 
-TEST_F(CreateSamlTokenTest, AnswersNothingMoreForAMinimalToken) {
+TEST_F(CreateSamlTokenTest, ReadsAMinimalToken) {
   const auto token = CreateSamlToken(Fixture("bearer-minimal"), Trusted());
   EXPECT_FALSE(token->IsRenewable());
   EXPECT_FALSE(token->IsDelegable());
@@ -152,7 +152,7 @@ TEST_F(CreateSamlTokenTest, AcceptsEveryGenuineToken) {
   }
 }
 
-TEST_F(CreateSamlTokenTest, GivesTheTextBackByteForByte) {
+TEST_F(CreateSamlTokenTest, ReturnsTheTextByteForByte) {
   for (const char *const name : {"bearer", "style-pretty", "c14n-inclusive-with-comments"}) {
     const std::string xml = Fixture(name);
     EXPECT_EQ(xml, CreateSamlToken(xml, Trusted())->ToXml());
@@ -170,7 +170,7 @@ std::string CanonicalFormByLibxml2(const std::string &xml) {
   return text;
 }
 
-/// Just behind the end tag of the assertion; processing instructions may follow it.
+/// The position after the end tag of the assertion. Processing instructions may follow it.
 std::size_t EndOfAssertion(const std::string &xml) {
   return xml.rfind("Assertion>") + std::string_view("Assertion>").size();
 }
@@ -184,7 +184,7 @@ std::string DocumentElementOf(const std::string &canonical) {
   return canonical.substr(begin, EndOfAssertion(canonical) - begin);
 }
 
-TEST_F(CreateSamlTokenTest, FromDomGivesTheCanonicalFormOfTheElement) {
+TEST_F(CreateSamlTokenTest, FromDomReturnsTheCanonicalFormOfTheElement) {
   for (const char *const name : {"full", "style-pretty", "c14n-inclusive-with-comments", "style-default-namespace"}) {
     SCOPED_TRACE(name);
     const ParsedDocument document(Fixture(name));
@@ -193,18 +193,18 @@ TEST_F(CreateSamlTokenTest, FromDomGivesTheCanonicalFormOfTheElement) {
   }
 }
 
-TEST_F(CreateSamlTokenTest, FromDomTakesAnAssertionWithinALargerDocument) {
+TEST_F(CreateSamlTokenTest, FromDomAcceptsAnAssertionInALargerDocument) {
   const std::string declaration = "<?xml version=\"1.0\"?>\n";
   const std::string token = ReplaceOnce(Fixture("full"), declaration, "");
   const ParsedDocument document("<e:Envelope xmlns:e='urn:envelope'>" + token + "</e:Envelope>");
   const auto fromDom = CreateSamlTokenFromDom(document.Child("Assertion"), Trusted());
   EXPECT_EQ("alice", fromDom->GetSubject().name);
-  // Inclusive canonicalisation keeps the declarations in scope, and under exclusive ones the text verifies again.
+  // Inclusive canonicalisation writes all declarations in scope. An exclusive signature ignores them, so the text verifies.
   EXPECT_NE(std::string::npos, fromDom->ToXml().find("xmlns:e=\"urn:envelope\""));
   EXPECT_EQ(fromDom->GetId(), CreateSamlToken(fromDom->ToXml(), Trusted())->GetId());
 }
 
-TEST_F(CreateSamlTokenTest, FromDomPassesAnElementWithoutCanonicalFormOnAsThePlatformsException) {
+TEST_F(CreateSamlTokenTest, FromDomPassesOnTheExceptionOfAnElementWithoutCanonicalForm) {
   const ParsedDocument document(
       "<Assertion xmlns=\"urn:oasis:names:tc:SAML:2.0:assertion\"><none:Issuer/></Assertion>");
   EXPECT_THROWS_MESSAGE(CreateSamlTokenFromDom(document.Root(), Trusted()), Tarvel::Xml::Security::XmlSecurityException,
@@ -220,14 +220,14 @@ TEST_F(CreateSamlTokenTest, OutlivesTheDocumentItWasMadeFrom) {
   EXPECT_EQ("CN=holder,O=Example", token->GetConfirmationCertificate()->GetSubject());
 }
 
-TEST_F(CreateSamlTokenTest, PassesMalformedXmlOnAsTheParsersException) {
+TEST_F(CreateSamlTokenTest, PassesOnTheParsersExceptionForMalformedXml) {
   for (const std::string &xml : {std::string(), std::string("not XML"), std::string("<Assertion"),
                                  std::string("<!DOCTYPE a><a/>"), std::string("\xff\xfe<a/>"), std::string(1, '\0')}) {
     EXPECT_THROW(CreateSamlToken(xml, Trusted()), Tarvel::Xml::XMLParseException) << xml;
   }
 }
 
-TEST_F(CreateSamlTokenTest, RefusesADocumentThatIsNoAssertion) {
+TEST_F(CreateSamlTokenTest, RefusesADocumentThatIsNotAnAssertion) {
   EXPECT_THROWS_MESSAGE(CreateSamlToken("<html/>", Trusted()), ParseException,
                         "Expected element 'Assertion' not found.");
   const ParsedDocument document("<html/>");
@@ -246,12 +246,12 @@ TEST_F(CreateSamlTokenTest, RefusesAChangedToken) {
   }
 }
 
-TEST_F(CreateSamlTokenTest, RefusesATokenOfAKeyOutsideTheTrustedOnes) {
+TEST_F(CreateSamlTokenTest, RefusesATokenSignedWithAKeyThatIsNotTrusted) {
   EXPECT_THROWS_MESSAGE(CreateSamlToken(Fixture("signed-by-other"), Trusted()), InvalidSignatureException, TAMPERED);
   EXPECT_THROWS_MESSAGE(CreateSamlToken(Fixture("full"), Trusted("sts-rsa-2")), InvalidSignatureException, TAMPERED);
 }
 
-TEST_F(CreateSamlTokenTest, AcceptsATokenOfAnyOfTheTrustedKeys) {
+TEST_F(CreateSamlTokenTest, AcceptsATokenSignedWithAnyTrustedKey) {
   CertificateList trusted = Trusted();
   trusted.push_back(Trusted("sts-rsa-2").front());
   EXPECT_NO_THROW(CreateSamlToken(Fixture("bearer"), trusted));
@@ -269,7 +269,7 @@ TEST_F(CreateSamlTokenTest, RefusesEveryTokenWhenNothingIsTrusted) {
   EXPECT_THROWS_MESSAGE(CreateSamlToken(Fixture("bearer"), Trusted("sts-ec256")), InvalidSignatureException, message);
 }
 
-TEST_F(CreateSamlTokenTest, TakesOneCertificateByPointer) {
+TEST_F(CreateSamlTokenTest, AcceptsOneCertificateByPointer) {
   const CertificateList trusted = Trusted();
   EXPECT_NO_THROW(CreateSamlToken(Fixture("bearer"), trusted.front().get()));
 }
@@ -281,7 +281,7 @@ TEST_F(CreateSamlTokenTest, RefusesExpiredAndEarlyTokens) {
                         "Token start date is in the future: 2110-01-01T00:00:00.000Z");
 }
 
-TEST_F(CreateSamlTokenTest, WidensTheWindowByTheGivenTolerance) {
+TEST_F(CreateSamlTokenTest, ExtendsTheValidityByTheGivenTolerance) {
   constexpr std::int64_t HUNDRED_YEARS = std::int64_t{100} * 366 * 86400;
   EXPECT_NO_THROW(CreateSamlToken(Fixture("expired"), Trusted(), HUNDRED_YEARS));
   EXPECT_NO_THROW(CreateSamlToken(Fixture("early"), Trusted(), HUNDRED_YEARS));
@@ -289,7 +289,7 @@ TEST_F(CreateSamlTokenTest, WidensTheWindowByTheGivenTolerance) {
   EXPECT_NO_THROW(CreateSamlTokenFromDom(document.Root(), Trusted(), HUNDRED_YEARS));
 }
 
-TEST(CreateSamlTokenClock, ToleratesTenMinutesWhenNothingElseIsSaid) {
+TEST(CreateSamlTokenClock, ToleratesTenMinutesByDefault) {
   const std::int64_t end = DateTime("2021-01-01T00:00:00Z").GetUtcTime();
   const ParsedDocument document(Fixture("expired"));
   const CertificateList trusted = Trusted();
@@ -318,12 +318,12 @@ TEST_F(CreateSamlTokenTest, ChecksSyntaxThenPropertiesThenSignature) {
 }
 
 TEST_F(CreateSamlTokenTest, VerifiesBeforeItReadsTheFacts) {
-  // The name is not of the right form, but what was changed is not believed enough to say so.
+  // The name is malformed, but nothing of a token that was changed is reported.
   const std::string tampered = ReplaceOnce(Fixture("bearer"), ">alice@corp.example<", ">alice<");
   EXPECT_THROWS_MESSAGE(CreateSamlToken(tampered, Trusted()), InvalidSignatureException, TAMPERED);
 }
 
-/// What a prefix of a token is refused with is a matter of luck, but it is refused, and with a documented class.
+/// A prefix of a token is refused with one of the documented classes. Which one depends on where the text ends.
 void ExpectRefused(const std::string &xml, const CertificateList &trusted) {
   try {
     CreateSamlToken(xml, trusted);

@@ -1,5 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
-// Which of two faults of an assertion is reported: relying parties and support read the message of the first.
+// Which of two faults of an assertion is reported: relying parties and support rely on it being the first.
 #include "support/parsed_document.h"
 #include "support/throws_message.h"
 #include "token/assertion_parser.h"
@@ -35,12 +35,12 @@ void ParseChanged(std::string text, const std::vector<Change> &changes) {
 }
 
 /// Each change alone must be refused with its own message, and both with the message of the first.
-void ExpectFirst(const std::string &good, const Change &first, const std::string &message, const Change &second,
+void ExpectFirst(const std::string &valid, const Change &first, const std::string &message, const Change &second,
                  const std::string &secondMessage) {
   SCOPED_TRACE(message + " | " + secondMessage);
-  EXPECT_THROWS_MESSAGE(ParseChanged(good, {first}), ParseException, message);
-  EXPECT_THROWS_MESSAGE(ParseChanged(good, {second}), ParseException, secondMessage);
-  EXPECT_THROWS_MESSAGE(ParseChanged(good, {first, second}), ParseException, message);
+  EXPECT_THROWS_MESSAGE(ParseChanged(valid, {first}), ParseException, message);
+  EXPECT_THROWS_MESSAGE(ParseChanged(valid, {second}), ParseException, secondMessage);
+  EXPECT_THROWS_MESSAGE(ParseChanged(valid, {first, second}), ParseException, message);
 }
 
 std::string Missing(const std::string &element, const std::string &attribute) {
@@ -164,7 +164,7 @@ TEST(RefusalOrder, TheCountOfARestrictionComesBeforeItsContent) {
 
 constexpr const char *UPN = "http://schemas.xmlsoap.org/claims/UPN";
 
-/// An assertion whose group and whose delegate are not of their form.
+/// An assertion with a malformed group and a malformed delegate.
 SamlAssertionType WithTwoBadNames() {
   SamlAssertionType assertion;
   assertion.Subject.NameID = {UPN, "alice@corp"};
@@ -188,7 +188,7 @@ TEST(FactsOrder, TheAttributesAreReadBeforeTheDelegates) {
                         "Failed to parse Group Identity value: `no backslash'; domain or group missing");
 }
 
-TEST(FactsOrder, TheDelegatesAreReadAtLast) {
+TEST(FactsOrder, TheDelegatesAreReadLast) {
   SamlAssertionType assertion = WithTwoBadNames();
   assertion.AttributeStatement->attributes.clear();
   EXPECT_THROWS_MESSAGE(TakeTokenFacts(std::move(assertion)), ParseException,

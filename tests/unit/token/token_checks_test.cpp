@@ -32,7 +32,7 @@ protected:
   static DateTime AtSecond(std::int64_t second) { return DateTimeFromUtc(m_now + second * SECOND, false); }
 
   /// A bearer token that is valid from an hour ago for two hours.
-  static SamlAssertionType Good() {
+  static SamlAssertionType ValidAssertion() {
     SamlAssertionType assertion;
     assertion.Version = "2.0";
     assertion.ID = "_1";
@@ -43,12 +43,12 @@ protected:
   }
 
   static SamlAssertionType HolderOfKey() {
-    SamlAssertionType assertion = Good();
+    SamlAssertionType assertion = ValidAssertion();
     assertion.Subject.SubjectConfirmation.Method = SamlToken::HOLDER_OF_KEY;
     return assertion;
   }
 
-  /// A holder-of-key token, whose end no rule but its own looks at.
+  /// A holder-of-key token, so that only the rule under test reads the end.
   static SamlAssertionType ValidBetween(std::int64_t from, std::int64_t to) {
     SamlAssertionType assertion = HolderOfKey();
     assertion.Conditions.NotBefore = AtSecond(from);
@@ -64,13 +64,13 @@ private:
 };
 
 TEST_F(CheckTokenPropertiesTest, AcceptsACurrentToken) {
-  EXPECT_NO_THROW(Check(Good()));
+  EXPECT_NO_THROW(Check(ValidAssertion()));
   EXPECT_NO_THROW(Check(HolderOfKey()));
 }
 
 TEST_F(CheckTokenPropertiesTest, RefusesEveryOtherVersion) {
   for (const std::string version : {"", "2", "2.0 ", " 2.0", "2.00", "1.1", "2.1"}) {
-    SamlAssertionType assertion = Good();
+    SamlAssertionType assertion = ValidAssertion();
     assertion.Version = version;
     EXPECT_THROWS_MESSAGE(Check(assertion), ParseException, "Invalid token version");
   }
@@ -78,21 +78,21 @@ TEST_F(CheckTokenPropertiesTest, RefusesEveryOtherVersion) {
 
 TEST_F(CheckTokenPropertiesTest, RefusesAnIdThatDoesNotBeginWithAnUnderscore) {
   for (const std::string id : {"", "123", "a_", " _1"}) {
-    SamlAssertionType assertion = Good();
+    SamlAssertionType assertion = ValidAssertion();
     assertion.ID = id;
     EXPECT_THROWS_MESSAGE(Check(assertion), ParseException, "Invalid token ID");
   }
 }
 
-TEST_F(CheckTokenPropertiesTest, AcceptsDigitsBehindAnUnderscore) {
-  SamlAssertionType assertion = Good();
+TEST_F(CheckTokenPropertiesTest, AcceptsDigitsAfterAnUnderscore) {
+  SamlAssertionType assertion = ValidAssertion();
   for (const std::string id : {"_123", "_"}) {
     assertion.ID = id;
     EXPECT_NO_THROW(Check(assertion)) << id;
   }
 }
 
-TEST_F(CheckTokenPropertiesTest, RefusesAWindowWithoutContentBeforeItLooksAtTheClock) {
+TEST_F(CheckTokenPropertiesTest, RefusesAnEmptyValidityBeforeItReadsTheClock) {
   const std::string message = "Unsatisfiable token validity conditions: NotBefore must be less than NotOnOrAfter.";
   EXPECT_THROWS_MESSAGE(Check(ValidBetween(0, 0)), ParseException, message);
   EXPECT_THROWS_MESSAGE(Check(ValidBetween(1, 0)), ParseException, message);
@@ -121,14 +121,14 @@ TEST_F(CheckTokenPropertiesTest, AcceptsAnEndWithinTheTolerance) {
   EXPECT_NO_THROW(Check(ValidBetween(-3600, -599)));
 }
 
-TEST_F(CheckTokenPropertiesTest, RefusesAnEndAtTheToleranceAndTellsTheBareEnd) {
+TEST_F(CheckTokenPropertiesTest, RefusesAnEndAtTheToleranceAndReportsTheEndWithoutTolerance) {
   EXPECT_THROWS_MESSAGE(Check(ValidBetween(-3600, -600)), ParseException,
                         "The token has expired at: 2026-01-02T02:54:05.006Z");
   EXPECT_THROWS_MESSAGE(Check(ValidBetween(-3600, -601)), ParseException,
                         "The token has expired at: 2026-01-02T02:54:04.006Z");
 }
 
-TEST_F(CheckTokenPropertiesTest, NarrowsTheWindowByANegativeTolerance) {
+TEST_F(CheckTokenPropertiesTest, ShortensTheValidityByANegativeTolerance) {
   EXPECT_NO_THROW(CheckTokenProperties(ValidBetween(-60, 61), -60));
   EXPECT_THROWS_MESSAGE(CheckTokenProperties(ValidBetween(-59, 3600), -60), ParseException,
                         "Token start date is in the future: 2026-01-02T03:03:06.006Z");
@@ -136,7 +136,7 @@ TEST_F(CheckTokenPropertiesTest, NarrowsTheWindowByANegativeTolerance) {
                         "The token has expired at: 2026-01-02T03:05:05.006Z");
 }
 
-TEST_F(CheckTokenPropertiesTest, AcceptsEveryWindowWithATolerancePastAllTime) {
+TEST_F(CheckTokenPropertiesTest, AcceptsEveryValidityWithATolerancePastAllTime) {
   SamlAssertionType assertion = HolderOfKey();
   for (const std::int64_t tolerance : {LARGEST, LARGEST / SECOND, LARGEST / SECOND + 1}) {
     assertion.Conditions.NotBefore = DateTime("0001-01-01T00:00:00Z");
@@ -148,9 +148,9 @@ TEST_F(CheckTokenPropertiesTest, AcceptsEveryWindowWithATolerancePastAllTime) {
   }
 }
 
-TEST_F(CheckTokenPropertiesTest, RefusesEveryWindowWithAToleranceBeforeAllTime) {
+TEST_F(CheckTokenPropertiesTest, RefusesEveryValidityWithAToleranceBeforeAllTime) {
   for (const std::int64_t tolerance : {SMALLEST, SMALLEST / SECOND, SMALLEST / SECOND - 1}) {
-    EXPECT_THROWS_MESSAGE(CheckTokenProperties(Good(), tolerance), ParseException,
+    EXPECT_THROWS_MESSAGE(CheckTokenProperties(ValidAssertion(), tolerance), ParseException,
                           "Token start date is in the future: 2026-01-02T02:04:05.006Z");
   }
 }
@@ -180,19 +180,19 @@ TEST_F(CheckTokenPropertiesTest, AppliesTheToleranceBeyondTheFirstAndTheLastDate
 }
 
 TEST_F(CheckTokenPropertiesTest, RefusesABearerSubjectThatEndsBeforeTheToken) {
-  SamlAssertionType assertion = Good();
+  SamlAssertionType assertion = ValidAssertion();
   assertion.Subject.SubjectConfirmation.SubjectConfirmationData.NotOnOrAfter = AtSecond(3599);
   EXPECT_THROWS_MESSAGE(Check(assertion), ParseException, "Invalid token subject validity");
   EXPECT_THROWS_MESSAGE(CheckTokenProperties(assertion, LARGEST), ParseException, "Invalid token subject validity");
 }
 
 TEST_F(CheckTokenPropertiesTest, AcceptsABearerSubjectThatEndsLater) {
-  SamlAssertionType assertion = Good();
+  SamlAssertionType assertion = ValidAssertion();
   assertion.Subject.SubjectConfirmation.SubjectConfirmationData.NotOnOrAfter = AtSecond(3601);
   EXPECT_NO_THROW(Check(assertion));
 }
 
-TEST_F(CheckTokenPropertiesTest, DoesNotAskWhenAHolderOfKeySubjectEnds) {
+TEST_F(CheckTokenPropertiesTest, IgnoresTheEndOfAHolderOfKeySubject) {
   SamlAssertionType assertion = HolderOfKey();
   assertion.Subject.SubjectConfirmation.SubjectConfirmationData.NotOnOrAfter = AtSecond(3599);
   EXPECT_NO_THROW(Check(assertion));
@@ -211,30 +211,30 @@ SamlAssertionType WithDelegation(SamlAssertionType assertion, const boost::optio
 }
 
 TEST_F(CheckTokenPropertiesTest, AcceptsADelegateIdThatIsTheLastDelegate) {
-  EXPECT_NO_THROW(Check(WithDelegation(Good(), BACKUP, {BACKUP})));
-  EXPECT_NO_THROW(Check(WithDelegation(Good(), BACKUP, {GATEWAY, BACKUP})));
+  EXPECT_NO_THROW(Check(WithDelegation(ValidAssertion(), BACKUP, {BACKUP})));
+  EXPECT_NO_THROW(Check(WithDelegation(ValidAssertion(), BACKUP, {GATEWAY, BACKUP})));
 }
 
 TEST_F(CheckTokenPropertiesTest, RefusesADelegateIdThatIsNotTheLastDelegate) {
   const std::string message = "The SubjectConfirmation delegate id does not match the id of the last delegate";
-  EXPECT_THROWS_MESSAGE(Check(WithDelegation(Good(), GATEWAY, {GATEWAY, BACKUP})), ParseException, message);
-  EXPECT_THROWS_MESSAGE(Check(WithDelegation(Good(), NameIDType{"urn:other", BACKUP.value}, {BACKUP})), ParseException,
-                        message);
-  EXPECT_THROWS_MESSAGE(Check(WithDelegation(Good(), NameIDType{BACKUP.Format, "Backup@corp"}, {BACKUP})),
+  EXPECT_THROWS_MESSAGE(Check(WithDelegation(ValidAssertion(), GATEWAY, {GATEWAY, BACKUP})), ParseException, message);
+  EXPECT_THROWS_MESSAGE(Check(WithDelegation(ValidAssertion(), NameIDType{"urn:other", BACKUP.value}, {BACKUP})),
+                        ParseException, message);
+  EXPECT_THROWS_MESSAGE(Check(WithDelegation(ValidAssertion(), NameIDType{BACKUP.Format, "Backup@corp"}, {BACKUP})),
                         ParseException, message);
 }
 
 TEST_F(CheckTokenPropertiesTest, RefusesADelegateIdWithoutDelegation) {
-  EXPECT_THROWS_MESSAGE(Check(WithDelegation(Good(), BACKUP, {})), ParseException,
+  EXPECT_THROWS_MESSAGE(Check(WithDelegation(ValidAssertion(), BACKUP, {})), ParseException,
                         "Token SubjectConfirmation contains delegate id, but no delegation restriction is present");
 }
 
 TEST_F(CheckTokenPropertiesTest, RefusesDelegationWithoutADelegateId) {
-  EXPECT_THROWS_MESSAGE(Check(WithDelegation(Good(), boost::none, {BACKUP})), ParseException,
+  EXPECT_THROWS_MESSAGE(Check(WithDelegation(ValidAssertion(), boost::none, {BACKUP})), ParseException,
                         "Token has delegation restriction, but no delegate id is present in the SubjectConfirmation");
 }
 
-TEST_F(CheckTokenPropertiesTest, NamesTheFirstRuleThatFails) {
+TEST_F(CheckTokenPropertiesTest, ReportsTheFirstRuleThatFails) {
   SamlAssertionType assertion = WithDelegation(ValidBetween(9000, 9000), BACKUP, {});
   assertion.Version = "3";
   assertion.ID = "";
@@ -249,8 +249,8 @@ TEST_F(CheckTokenPropertiesTest, NamesTheFirstRuleThatFails) {
                         "Token start date is in the future: 2026-01-02T05:34:05.006Z");
 }
 
-TEST_F(CheckTokenPropertiesTest, NamesOfABearerTokenTheFirstRuleThatFails) {
-  SamlAssertionType assertion = WithDelegation(Good(), BACKUP, {});
+TEST_F(CheckTokenPropertiesTest, ReportsTheFirstRuleThatABearerTokenFails) {
+  SamlAssertionType assertion = WithDelegation(ValidAssertion(), BACKUP, {});
   DateTime &subjectEnd = assertion.Subject.SubjectConfirmation.SubjectConfirmationData.NotOnOrAfter;
   assertion.Conditions.NotOnOrAfter = AtSecond(-600);
   subjectEnd = AtSecond(-601);
@@ -270,7 +270,7 @@ TEST_F(CheckTokenPropertiesTest, ReadsTheClockOnce) {
     return now;
   };
   const Tarvel::ScopedEnvironment clock({look, {}});
-  Check(Good());
+  Check(ValidAssertion());
   EXPECT_EQ(looks, 1);
 }
 

@@ -33,7 +33,7 @@ AttributeType Attribute(const std::string &name, const std::vector<std::string> 
   return attribute;
 }
 
-TEST(SamlAttributeIs, TellsTheFourAttributesApartByTheirWholeName) {
+TEST(SamlAttributeIs, RecognisesTheFourAttributesByTheirWholeName) {
   const std::vector<std::string> names{GROUP_IDENTITY, IS_SOLUTION, GIVEN_NAME, SUR_NAME};
   const auto kinds = [](const std::string &name) {
     const AttributeType attribute = Attribute(name, {});
@@ -49,13 +49,13 @@ TEST(SamlAttributeIs, TellsTheFourAttributesApartByTheirWholeName) {
   }
 }
 
-TEST(ParseGroupIdentity, PartsAtTheFirstBackslash) {
+TEST(ParseGroupIdentity, SplitsAtTheFirstBackslash) {
   const PrincipalId group = ParseGroupIdentity("corp\\admins");
   EXPECT_EQ("admins", group.name);
   EXPECT_EQ("corp", group.domain);
 }
 
-TEST(ParseGroupIdentity, LeavesFurtherBackslashesInTheName) {
+TEST(ParseGroupIdentity, KeepsFurtherBackslashesInTheName) {
   const PrincipalId group = ParseGroupIdentity("corp\\admins\\x");
   EXPECT_EQ("admins\\x", group.name);
   EXPECT_EQ("corp", group.domain);
@@ -68,7 +68,7 @@ TEST(ParseGroupIdentity, RefusesWhenAPartIsMissing) {
   }
 }
 
-TEST(ParseSamlNameId, PartsAtTheLastAtSign) {
+TEST(ParseSamlNameId, SplitsAtTheLastAtSign) {
   const PrincipalId alice = ParseSamlNameId({UPN, "alice@corp.example"});
   EXPECT_EQ("alice", alice.name);
   EXPECT_EQ("corp.example", alice.domain);
@@ -113,7 +113,7 @@ TEST(ParsePrincipalNameAttribute, IsTheFirstValueOrEmpty) {
   EXPECT_EQ("", ParsePrincipalNameAttribute(Attribute(GIVEN_NAME, {})));
 }
 
-TEST(ParseToDelegate, TakesNameAndInstant) {
+TEST(ParseToDelegate, HasNameAndInstant) {
   const Delegate delegate = ParseToDelegate({DateTime("2026-01-01T00:00:01Z"), {UPN, "gateway@corp"}});
   EXPECT_EQ((PrincipalId{"gateway", "corp"}), delegate.subject);
   EXPECT_EQ(DateTime("2026-01-01T00:00:01Z"), delegate.delegationInstant);
@@ -133,7 +133,7 @@ TokenFacts FactsWith(const std::vector<AttributeType> &attributes) {
   return TakeTokenFacts(std::move(assertion));
 }
 
-TEST(TakeTokenFacts, WithoutAttributeStatementThereAreNoGroupsNamesNorSolution) {
+TEST(TakeTokenFacts, HasNoGroupsNamesOrSolutionWithoutAttributeStatement) {
   const TokenFacts facts = TakeTokenFacts(Minimal());
   EXPECT_TRUE(facts.groups.empty());
   EXPECT_EQ((std::pair<std::string, std::string>()), facts.fullName);

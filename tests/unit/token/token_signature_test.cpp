@@ -19,8 +19,8 @@ using namespace Testing;
 
 constexpr const char *REFERENCE_END = "</ds:Reference>";
 
-/// Parses an assertion that has `signature` and then an element as its children; answers the local name of what the cursor
-/// stands on afterwards.
+/// Parses an assertion whose children are `signature` and another element. Returns the local name of the node at the cursor
+/// afterwards.
 std::string Parse(const std::string &signature) {
   const ParsedDocument document(Assertion({signature, "<next/>"}));
   NodeFilterIterator iterator = document.Cursor().GetChild();
@@ -40,20 +40,20 @@ std::string Reference(const std::string &uri) {
   return signature.substr(begin, signature.find(REFERENCE_END) + std::string(REFERENCE_END).size() - begin);
 }
 
-TEST(ParseTokenSignature, TakesAReferenceToTheAssertionAndMovesOn) {
+TEST(ParseTokenSignature, AcceptsAReferenceToTheAssertionAndMovesTheCursor) {
   EXPECT_EQ("next", Parse(Piece::SIGNATURE));
 }
 
-TEST(ParseTokenSignature, TakesAReferenceToTheWholeDocument) {
+TEST(ParseTokenSignature, AcceptsAReferenceToTheWholeDocument) {
   EXPECT_EQ("next", Parse(WithUri("")));
 }
 
-TEST(ParseTokenSignature, TakesASecondReferenceToTheAssertion) {
+TEST(ParseTokenSignature, AcceptsASecondReferenceToTheAssertion) {
   EXPECT_EQ("next", Parse(ReplaceOnce(Piece::SIGNATURE, Reference("#_a1"), Reference("#_other") + Reference("#_a1"))));
   EXPECT_EQ("next", Parse(ReplaceOnce(Piece::SIGNATURE, Reference("#_a1"), Reference("#_other") + Reference(""))));
 }
 
-TEST(ParseTokenSignature, TakesAFirstReferenceToTheAssertion) {
+TEST(ParseTokenSignature, AcceptsAFirstReferenceToTheAssertion) {
   EXPECT_EQ("next", Parse(ReplaceOnce(Piece::SIGNATURE, Reference("#_a1"), Reference("#_a1") + Reference("#_other"))));
   EXPECT_EQ("next", Parse(ReplaceOnce(Piece::SIGNATURE, Reference("#_a1"), Reference("") + Reference("#_other"))));
 }
@@ -81,7 +81,7 @@ TEST(ParseTokenSignature, RefusesWhenThereIsNoElement) {
                         "Expected element ds:Signature not found");
 }
 
-TEST(ParseTokenSignature, TellsThePlatformsReasonForASyntaxError) {
+TEST(ParseTokenSignature, ReportsThePlatformsReasonForASyntaxError) {
   const std::string start = Piece::START;
   EXPECT_THROWS_MESSAGE(Parse("<saml:Subject/>"), ParseException,
                         "Signature syntax error: Expected ds:Signature, found \"saml:Subject\" at line 1, column " +

@@ -15,7 +15,7 @@ namespace {
 
 const OutputOptions OUTPUT;
 
-TEST(AskForToken, GivesTheTokenOfTheCall) {
+TEST(AskForToken, ReturnsTheTokenOfTheCall) {
   const auto token = std::make_shared<const Testing::TokenStandIn>("_1", "<a/>", SamlToken::BEARER);
   EXPECT_EQ(token, AskForToken([&]() -> std::shared_ptr<const SamlToken> { return token; }, nullptr, OUTPUT).token);
 }
@@ -25,7 +25,7 @@ TEST(AskForToken, RefusesAResponseThatHoldsNoToken) {
                         "The response holds no token");
 }
 
-TEST(CallService, LetsFailuresThatAreNotOfTheAnswerPassAsTheyAre) {
+TEST(CallService, PassesOnFailuresThatAreNotAboutTheAnswer) {
   EXPECT_THROWS_MESSAGE(CallService([]() -> bool { throw InvalidSignatureException("wrong"); }),
                         InvalidSignatureException, "wrong");
   EXPECT_THROWS_MESSAGE(CallService([]() -> bool { throw Tarvel::Xml::Security::XmlSecurityException("no key"); }),
@@ -34,7 +34,7 @@ TEST(CallService, LetsFailuresThatAreNotOfTheAnswerPassAsTheyAre) {
                         "exhausted");
 }
 
-TEST(CallService, TakesWhatCannotBeReadForAFaultOfTheService) {
+TEST(CallService, ReportsAnAnswerThatCannotBeReadAsAFaultOfTheService) {
   EXPECT_THROWS_MESSAGE(CallService([]() -> bool { throw ParseException("no element"); }), SsoException, "no element");
   EXPECT_THROWS_MESSAGE(CallService([]() -> bool { throw Tarvel::Xml::XMLParseException("no XML", 1, 2); }),
                         SsoException, "no XML at line 1, column 2");

@@ -23,7 +23,7 @@ TokenSpec SpecFor(std::int64_t lifetimeSec) {
   return spec;
 }
 
-/// A token that lasts for an hour from the moment on at which it was asked for.
+/// A token that is valid for an hour from the moment when it was asked for.
 TokenFacts HourFrom(const char *start = "2026-01-01T12:00:00Z", const char *end = "2026-01-01T13:00:00Z") {
   TokenFacts facts;
   facts.startDate = DateTime(start);
@@ -40,7 +40,7 @@ std::vector<std::string> KeysOf(const std::vector<UnmetRequest> &unmet) {
   return keys;
 }
 
-/// What is wanted and not there, for a token of an hour with these facts.
+/// The unmet requests as text, for a token with these facts.
 std::vector<std::string> WantedOf(const TokenSpec &spec, const TokenFacts &facts) {
   std::vector<std::string> wanted;
   for (const UnmetRequest &request : FindUnmet(spec, ASKED_AT, facts, 0)) {
@@ -59,7 +59,7 @@ TokenSpec SpecWithEverything() {
   return spec;
 }
 
-TEST(FindUnmet, NamesEverythingThatIsNotThereInOneOrder) {
+TEST(FindUnmet, ListsEverythingThatIsMissingInAFixedOrder) {
   EXPECT_THAT(KeysOf(FindUnmet(SpecWithEverything(), ASKED_AT, HourFrom(), 0)),
               ElementsAre("delegation", "renewable", "delegable", "advice", "audience", "lifetime"));
   EXPECT_THAT(WantedOf(SpecWithEverything(), HourFrom()),
@@ -69,7 +69,7 @@ TEST(FindUnmet, NamesEverythingThatIsNotThereInOneOrder) {
                           "a lifetime of 7200 seconds; the token ends at 2026-01-01T13:00:00.000Z"));
 }
 
-TEST(FindUnmet, NamesNothingWhenEverythingIsThere) {
+TEST(FindUnmet, ListsNothingWhenNothingIsMissing) {
   TokenFacts facts = HourFrom("2026-01-01T12:00:00Z", "2026-01-01T14:00:00Z");
   facts.delegationChain = {{{"bob", "corp.example"}, DateTime()}};
   facts.renewable = true;
@@ -79,7 +79,7 @@ TEST(FindUnmet, NamesNothingWhenEverythingIsThere) {
   EXPECT_THAT(FindUnmet(SpecWithEverything(), ASKED_AT, facts, 0), IsEmpty());
 }
 
-TEST(FindUnmet, LetsATokenHaveWhatWasNotAskedFor) {
+TEST(FindUnmet, AcceptsATokenWithMoreThanWasAskedFor) {
   TokenFacts facts = HourFrom("2026-01-01T12:00:00Z", "2026-01-02T12:00:00Z");
   facts.delegationChain = {{{"bob", "corp.example"}, DateTime()}};
   facts.renewable = true;
@@ -113,7 +113,7 @@ TEST(FindUnmet, ComparesADelegateWithoutDomainByNameAlone) {
   EXPECT_THAT(WantedOf(spec, facts), ElementsAre("delegation to bob; the token is delegated to bobby@corp.example"));
 }
 
-TEST(FindUnmet, WantsEachValueOfEachAdviceInItsPlace) {
+TEST(FindUnmet, RequiresEachValueOfEachAdviceUnderItsSourceAndName) {
   TokenSpec spec = SpecFor(3600);
   spec.advice = {{"mapper", {{"color", {"green", "blue"}}, {"size", {"10"}}}}, {"audit", {{"by", {"alice"}}}}};
   TokenFacts facts = HourFrom();
@@ -123,7 +123,7 @@ TEST(FindUnmet, WantsEachValueOfEachAdviceInItsPlace) {
   EXPECT_THAT(WantedOf(spec, facts), ElementsAre("the advice mapper:color=blue, mapper:size=10"));
 }
 
-TEST(FindUnmet, WantsTheAudienceAsItIsWithoutMoreOrLess) {
+TEST(FindUnmet, RequiresExactlyTheAudienceThatWasAskedFor) {
   TokenSpec spec = SpecFor(3600);
   spec.audienceRestriction = {"a", "b"};
   TokenFacts facts = HourFrom();
@@ -140,7 +140,7 @@ struct Life {
   const char *start;
   const char *end;
   std::int64_t toleranceSec;
-  bool isMet; ///< for an hour that is asked for at 12:00:00
+  bool isMet; ///< for a lifetime of an hour, asked for at 12:00:00
 };
 
 const Life LIVES[] = {
@@ -172,7 +172,7 @@ TEST_P(FindUnmetLifetime, IsMetWhenItIsNotClearlyShorter) {
 INSTANTIATE_TEST_SUITE_P(Of, FindUnmetLifetime, testing::ValuesIn(LIVES),
                          [](const auto &life) { return std::string(life.param.name); });
 
-TEST(FindUnmet, StaysWithinItsNumbersAtTheEndOfTime) {
+TEST(FindUnmet, DoesNotOverflowAtTheLimitsOfDates) {
   const TokenFacts facts = HourFrom("0001-01-01T00:00:00Z", "9999-12-31T23:59:59Z");
   EXPECT_THAT(FindUnmet(SpecFor(100LL * 366 * 86400), ASKED_AT, facts, 600), IsEmpty());
 }

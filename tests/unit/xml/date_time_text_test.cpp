@@ -46,7 +46,7 @@ TEST(AddMinutesToDate, StaysInTheRangeOf32BitsForEveryNumber) {
   }
 }
 
-TEST(AddMinutesToDate, AnswersInUtc) {
+TEST(AddMinutesToDate, ReturnsUtc) {
   const DateTime date("2013-05-07T11:03:01.042+02:00");
   EXPECT_EQ("2013-05-07T09:13:01.042Z", DateTimeFormatter(AddMinutesToDate(date, 10)));
 }
@@ -62,7 +62,7 @@ TEST(DateTimeFormatter, AlwaysWritesMilliseconds) {
   EXPECT_EQ("2013-12-31T23:59:59.999Z", DateTimeFormatter(DateTime("2013-12-31T23:59:59.999999Z")));
 }
 
-TEST(DateTimeFormatter, EndsInTheZoneOfTheValue) {
+TEST(DateTimeFormatter, EndsWithTheZoneOfTheValue) {
   EXPECT_EQ("2013-05-07T11:03:01.042+02:00", DateTimeFormatter(DateTime("2013-05-07T11:03:01.042+02:00")));
 }
 

@@ -3,7 +3,6 @@
 #include "xml/node_filter_iterator.h"
 
 #include "support/parsed_document.h"
-#include "xml/xml_text.h"
 
 #include <gtest/gtest.h>
 
@@ -31,7 +30,7 @@ TEST(MoveToChild, StopsAtTextWithAnythingButWhiteSpace) {
   EXPECT_EQ(nullptr, IteratorToElement(iterator));
 }
 
-TEST(MoveToChild, TakesOnlyTheFourCharactersOfXmlAsWhiteSpace) {
+TEST(MoveToChild, HidesOnlyTheFourWhiteSpaceCharactersOfXml) {
   const ParsedDocument hidden("<r>\t\n&#13; </r>");
   EXPECT_EQ(nullptr, hidden.Cursor().MoveToChild().node);
   const ParsedDocument noBreakSpace("<r>\u00a0</r>");
@@ -52,14 +51,14 @@ TEST(MoveToChild, StopsAtProcessingInstruction) {
   EXPECT_EQ(nullptr, IteratorToElement(iterator));
 }
 
-TEST(MoveToChild, RunsOffTheEndWithoutChildren) {
+TEST(MoveToChild, MovesPastTheEndWithoutChildren) {
   const ParsedDocument document("<r/>");
   NodeFilterIterator iterator = document.Cursor();
   EXPECT_EQ(nullptr, iterator.MoveToChild().node);
   EXPECT_EQ(nullptr, iterator.MoveToChild().node);
 }
 
-TEST(MoveToChild, RunsOffTheEndWhenAllChildrenAreHidden) {
+TEST(MoveToChild, MovesPastTheEndWhenAllChildrenAreHidden) {
   const ParsedDocument document("<r> <!-- a --> <!-- b --> </r>");
   EXPECT_EQ(nullptr, document.Cursor().MoveToChild().node);
 }
@@ -72,7 +71,7 @@ TEST(MoveToSibling, SkipsWhiteSpaceAndComments) {
   EXPECT_EQ("b", IteratorToElement(iterator)->GetName());
 }
 
-TEST(MoveToSibling, PastTheLastAcceptedNodeLeavesNoElement) {
+TEST(MoveToSibling, MovesPastTheEndAfterTheLastVisibleNode) {
   const ParsedDocument document("<r><a/> <!-- note --> </r>");
   NodeFilterIterator iterator = document.Cursor().GetChild();
   EXPECT_EQ(nullptr, iterator.MoveToSibling().node);
@@ -80,14 +79,14 @@ TEST(MoveToSibling, PastTheLastAcceptedNodeLeavesNoElement) {
   EXPECT_EQ(nullptr, iterator.MoveToSibling().node);
 }
 
-TEST(GetChild, LeavesTheIteratorWhereItIs) {
+TEST(GetChild, DoesNotMoveTheIterator) {
   const ParsedDocument document("<r><a/></r>");
   const NodeFilterIterator iterator = document.Cursor();
   EXPECT_EQ("a", IteratorToElement(iterator.GetChild())->GetName());
   EXPECT_EQ(&document.Root(), iterator.node);
 }
 
-TEST(NodeFilterIterator, CopiesMoveOnTheirOwnAndShareTheFilter) {
+TEST(NodeFilterIterator, CopiesMoveIndependentlyAndShareTheFilter) {
   const ParsedDocument document("<r><a/><b/></r>");
   NodeFilterIterator original = document.Cursor().GetChild();
   NodeFilterIterator copy = original;
@@ -99,32 +98,10 @@ TEST(NodeFilterIterator, CopiesMoveOnTheirOwnAndShareTheFilter) {
   EXPECT_EQ("b", IteratorToElement(original)->GetName());
 }
 
-TEST(NodeFilterIterator, StandsOnItsFirstNodeWhateverTheFilterSays) {
+TEST(NodeFilterIterator, StartsAtItsFirstNodeEvenIfTheFilterHidesIt) {
   const ParsedDocument document("<r> </r>");
   const NodeFilterIterator iterator = ParsedDocument::CursorOn(*document.Root().GetFirstChild());
   EXPECT_EQ(document.Root().GetFirstChild(), iterator.node);
-}
-
-TEST(GetTextNode, LooksAtTheFirstChildOnly) {
-  const auto textOf = [](const std::string &xml) {
-    const ParsedDocument document(xml);
-    return GetText(GetTextNode(&document.Root()));
-  };
-  EXPECT_EQ("text", textOf("<r>text</r>"));
-  EXPECT_EQ(" text ", textOf("<r> text <e/></r>"));
-  EXPECT_EQ("", textOf("<r><e>text</e></r>"));
-  EXPECT_EQ("", textOf("<r><!-- note -->text</r>"));
-  EXPECT_EQ("", textOf("<r/>"));
-}
-
-TEST(GetTextNode, IsNullForNullAndForAnElementInFrontOfText) {
-  EXPECT_EQ(nullptr, GetTextNode(nullptr));
-  const ParsedDocument document("<r><e/>text</r>");
-  EXPECT_EQ(nullptr, GetTextNode(&document.Root()));
-}
-
-TEST(GetText, IsEmptyForNull) {
-  EXPECT_EQ("", GetText(nullptr));
 }
 
 } // namespace

@@ -35,7 +35,7 @@ TEST(QNameView, HasTheTextOfTheName) {
   EXPECT_EQ("b", LocalName("b").ToString());
 }
 
-TEST(ResolveQName, TakesThePrefixInScope) {
+TEST(ResolveQName, UsesThePrefixInScope) {
   const ParsedDocument document("<r xmlns:a='urn:outer' xmlns:b='urn:b'><e xmlns:a='urn:inner'/></r>");
   QName name;
   ResolveQName(document.Root(), "a:local", "urn:default", name);
@@ -53,7 +53,7 @@ TEST(ResolveQName, EndsThePrefixAtTheFirstColon) {
   EXPECT_EQ(QName("urn:a", "b:c"), name);
 }
 
-TEST(ResolveQName, PutsANameWithoutColonIntoTheGivenNamespace) {
+TEST(ResolveQName, UsesTheGivenNamespaceForANameWithoutColon) {
   const ParsedDocument document("<r xmlns='urn:in-scope'/>");
   QName name;
   ResolveQName(document.Root(), "local", "urn:given", name);
@@ -62,7 +62,7 @@ TEST(ResolveQName, PutsANameWithoutColonIntoTheGivenNamespace) {
   EXPECT_EQ(QName("", ""), name);
 }
 
-TEST(ResolveQName, RefusesAnUndefinedPrefixWithElementAndPlace) {
+TEST(ResolveQName, ReportsElementAndPlaceOfAnUndefinedPrefix) {
   const ParsedDocument document("<a:r xmlns:a='urn:a'>\n  <a:e/></a:r>");
   QName name("urn:before", "before");
   EXPECT_THROWS_MESSAGE(ResolveQName(document.Child("e"), "p:local", "", name), ParseException,
@@ -80,7 +80,7 @@ TEST(ElementQNameIs, ComparesLocalNameAndBoundNamespace) {
   EXPECT_FALSE(ElementQNameIs(nullptr, "r", "urn:a"));
 }
 
-TEST(ElementQNameIs, TakesTheDefaultNamespaceForAnElementWithoutPrefix) {
+TEST(ElementQNameIs, UsesTheDefaultNamespaceForAnElementWithoutPrefix) {
   const ParsedDocument document("<r xmlns='urn:a'/>");
   EXPECT_TRUE(ElementQNameIs(&document.Root(), "r", "urn:a"));
 }

@@ -25,7 +25,7 @@ TEST(RequireElementQName, ReturnsTheElement) {
   EXPECT_EQ(&document.Root(), &RequireElementQName(&document.Root(), "r", "urn:a"));
 }
 
-TEST(RequireElementQName, NamesTheExpectedElementWhenThereIsNoneOrAnother) {
+TEST(RequireElementQName, ReportsTheExpectedElementWhenThereIsNoneOrAnother) {
   const ParsedDocument document("<a:r xmlns:a='urn:a'/>");
   EXPECT_THROWS_MESSAGE(RequireElementQName(nullptr, "Issuer", "urn:a"), ParseException,
                         "Expected element 'Issuer' not found.");
@@ -33,7 +33,7 @@ TEST(RequireElementQName, NamesTheExpectedElementWhenThereIsNoneOrAnother) {
                         "Expected element 'Issuer' not found.");
 }
 
-TEST(RequireElementQName, NamesTheElementInAnotherNamespace) {
+TEST(RequireElementQName, ReportsAnElementInAnotherNamespace) {
   const ParsedDocument document("<a:r xmlns:a='urn:a'><p:e/></a:r>");
   EXPECT_THROWS_MESSAGE(RequireElementQName(&document.Root(), "r", "urn:b"), ParseException,
                         "Element 'a:r' has unexpected namespace");
@@ -81,14 +81,14 @@ TEST(RequireNoAttributes, RefusesEveryOtherAttribute) {
   }
 }
 
-TEST(RequireElementAttributesNames, AcceptsRequiredAndOptionalOnes) {
+TEST(RequireElementAttributesNames, AcceptsRequiredAndOptionalAttributes) {
   for (const std::string text : {"<r A='' B='2'/>", "<r C='3' B='2' A='1'/>", "<r xmlns:x='urn:x' A='1' B='2'/>"}) {
     const ParsedDocument document(text);
     EXPECT_NO_THROW(RequireElementAttributesNames(document.Root(), {"A", "B"}, {"C"})) << text;
   }
 }
 
-TEST(RequireElementAttributesNames, NamesTheFirstMissingOneInTheListsOrder) {
+TEST(RequireElementAttributesNames, ReportsTheFirstMissingAttributeInTheOrderOfTheList) {
   const ParsedDocument document("<r D='4'/>");
   EXPECT_THROWS_MESSAGE(RequireElementAttributesNames(document.Root(), {"A", "B"}, {}), ParseException,
                         "Node 'r is missing required attribute 'A'");
@@ -96,7 +96,7 @@ TEST(RequireElementAttributesNames, NamesTheFirstMissingOneInTheListsOrder) {
                         "Node 'r is missing required attribute 'B'");
 }
 
-TEST(RequireElementAttributesNames, DoesNotNameTheUnexpectedOne) {
+TEST(RequireElementAttributesNames, DoesNotReportTheNameOfAnUnexpectedAttribute) {
   const ParsedDocument document("<r A='1' B='2'/>");
   EXPECT_THROWS_MESSAGE(RequireElementAttributesNames(document.Root(), {"A"}, {"C"}), ParseException,
                         "Unexpected attributes on element 'r'");
@@ -111,14 +111,14 @@ TEST(RequireElementAttributesNames, ComparesNamesAsTheyAreWritten) {
 
 const QName TYPE("urn:a", "type");
 
-TEST(RequireElementAttributesQNames, AcceptsRequiredAndOptionalOnesUnderAnyPrefix) {
+TEST(RequireElementAttributesQNames, AcceptsRequiredAndOptionalAttributesWithAnyPrefix) {
   for (const std::string text : {"<r xmlns:a='urn:a' a:type='1'/>", "<r xmlns:b='urn:a' Count='1' b:type='1'/>"}) {
     const ParsedDocument document(text);
     EXPECT_NO_THROW(RequireElementAttributesQNames(document.Root(), {TYPE}, {LocalName("Count")})) << text;
   }
 }
 
-TEST(RequireElementAttributesQNames, NamesTheUnexpectedOne) {
+TEST(RequireElementAttributesQNames, ReportsTheNameOfAnUnexpectedAttribute) {
   const ParsedDocument document("<p:r xmlns:p='urn:p' xmlns:a='urn:a' a:type='1' a:Count='2' Other='3'/>");
   EXPECT_THROWS_MESSAGE(RequireElementAttributesQNames(document.Root(), {TYPE}, {LocalName("Count")}), ParseException,
                         "Unexpected attribute '{urn:a}Count' on element 'p:r'");
@@ -126,13 +126,13 @@ TEST(RequireElementAttributesQNames, NamesTheUnexpectedOne) {
                         ParseException, "Unexpected attribute 'Other' on element 'p:r'");
 }
 
-TEST(RequireElementAttributesQNames, DoesNotTakeAnAttributeWithoutPrefixForOneOfANamespace) {
+TEST(RequireElementAttributesQNames, IsNotSatisfiedByAnAttributeInNoNamespace) {
   const ParsedDocument document("<r xmlns='urn:a' type='1'/>");
   EXPECT_THROWS_MESSAGE(RequireElementAttributesQNames(document.Root(), {TYPE}, {}), ParseException,
                         "Unexpected attribute 'type' on element 'r'");
 }
 
-TEST(RequireElementAttributesQNames, NamesTheFirstMissingOne) {
+TEST(RequireElementAttributesQNames, ReportsTheFirstMissingAttribute) {
   const ParsedDocument document("<r xmlns:a='urn:a'/>");
   EXPECT_THROWS_MESSAGE(RequireElementAttributesQNames(document.Root(), {TYPE, LocalName("Count")}, {}), ParseException,
                         "Node 'r is missing required attribute '{urn:a}type'");
@@ -146,7 +146,7 @@ TEST(RequireElementAttributesQNames, RefusesAnUndefinedPrefix) {
                         "Element rat 1,1 uses undefined prefix: `p'");
 }
 
-TEST(RequireTextualContent, TakesTheOneText) {
+TEST(RequireTextualContent, ReadsASingleText) {
   const auto textOf = [](const std::string &xml) {
     const ParsedDocument document(xml);
     std::string text;
@@ -238,7 +238,7 @@ TEST(GetULongOptionalAttribute, ReadsDecimalDigits) {
   EXPECT_EQ(18446744073709551615u, ReadCount("Count='18446744073709551615'").value());
 }
 
-TEST(GetULongOptionalAttribute, RefusesWhatIsNoNumberOf64Bits) {
+TEST(GetULongOptionalAttribute, RefusesWhatIsNotANumberOf64Bits) {
   for (const std::string text : {"-1", "-0", "+1", "", " 1", "1 ", "0x1", "1.0", "1e3", "1,000", "one",
                                  "18446744073709551616", "99999999999999999999999"}) {
     EXPECT_THROWS_MESSAGE(ReadCount("Count='" + text + "'"), ParseException, "r/@Count is not a non-negative integer.");

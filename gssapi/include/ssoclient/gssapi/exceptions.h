@@ -1,7 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// What a negotiation through the system's GSSAPI raises. Where the GSSAPI failed, a message ends with all that it has to
-/// say: the texts of the major status, then those of the minor status, which are the mechanism's own words.
+/// The exceptions of a negotiation through the system's GSSAPI. When the GSSAPI has failed, the message ends with its
+/// texts: those of the major status, then those of the minor status, which are the mechanism's own.
 
 #pragma once
 
@@ -12,14 +12,14 @@
 
 namespace SsoClient::Gssapi {
 
-/// The client has no credentials to negotiate with: no ticket, an expired one, a cache or keytab that cannot be read, or
-/// a key that the realm does not take. Nothing has been sent to the service.
+/// The client has no credentials to negotiate with: there is no ticket, it has expired, a cache or keytab cannot be
+/// read, or the realm does not accept the key. Nothing has been sent to the service.
 class SSOCLIENT_GSSAPI_API GssCredentialException : public InvalidCredentialsException {
   TARVEL_EXCEPTION_BODY(GssCredentialException, InvalidCredentialsException);
 };
 
-/// The negotiation failed: the realm knows no such service or cannot be reached, a clock is wrong, the service's leg is
-/// no answer to the client's, or the service did not prove who it is.
+/// The negotiation failed: the realm does not know the service or cannot be reached, a clock is wrong, the service's
+/// leg is not an answer to the client's, or the service did not prove its identity.
 class SSOCLIENT_GSSAPI_API GssNegotiationException : public CommunicationException {
   TARVEL_EXCEPTION_BODY(GssNegotiationException, CommunicationException);
 };

@@ -13,46 +13,48 @@
 
 namespace SsoClient::Gssapi {
 
-/// Who negotiates with whom, by what credentials, and for how long at most. All texts are without null characters.
+/// The two sides of a negotiation, the client's credentials, and the limits. No text may contain a null character.
 struct SpnegoSettings {
-  /// The service: host-based as "HTTP@sts.corp.example", or, when there is a "/" in it, a Kerberos principal as
+  /// The service: host-based, such as "HTTP@sts.corp.example"; or, when it contains a "/", a Kerberos principal such as
   /// "HTTP/sts.corp.example@CORP.EXAMPLE". Required.
   std::string service;
-  /// The principal to negotiate as, as "alice@CORP.EXAMPLE"; empty for the one that the cache or the keytab has first.
+  /// The principal to negotiate as, such as "alice@CORP.EXAMPLE"; empty for the first of the cache or the keytab.
   std::string client;
-  /// The credential cache, as "FILE:/run/user/1000/tickets"; empty for the default one, which the environment variable
-  /// KRB5CCNAME may name to the Kerberos library.
+  /// The credential cache, such as "FILE:/run/user/1000/tickets"; empty for the default one. The Kerberos library takes
+  /// the default one from the environment variable KRB5CCNAME when that is set.
   std::string credentialCache;
-  /// A keytab to get a ticket with, as "FILE:/etc/example/client.keytab"; empty for none. The ticket is kept in
-  /// `credentialCache`, and renewed there when it has expired. Without one it stays in memory and goes with the handler:
-  /// the default cache is neither read nor written.
+  /// A keytab to get a ticket with, such as "FILE:/etc/example/client.keytab"; empty for none. The ticket is kept in
+  /// `credentialCache`, and replaced there when it has expired. Without a cache the ticket is kept in memory until the
+  /// handler is destroyed, and the default cache is neither read nor written.
   std::string clientKeytab;
-  /// Asks for the three-leg form of Kerberos (DCE style), in which the client confirms the service's answer by a leg of its
-  /// own. Only for services that expect it.
+  /// Asks for the three-leg form of Kerberos (DCE style), in which the client confirms the service's answer with a
+  /// further leg. Only for services that expect it.
   bool dceStyle = false;
-  /// How many legs the client makes at most, the answer to the final leg included. Kerberos makes two, three in DCE style.
+  /// The maximum number of the client's legs, including the answer to the final leg. Kerberos needs two, or three in
+  /// DCE style.
   int maximumLegs = 10;
-  /// Seconds from the first leg's beginning to the last one's end at most, which includes the waiting for the service. It
-  /// is looked at before and after each leg: what is under way is not interrupted.
+  /// The maximum time in seconds from the start of the first leg to the end of the last one, including the time that
+  /// the service takes. It is checked before and after each leg; nothing is interrupted.
   std::int64_t timeLimitSec = 60;
 };
 
-/// The client's part in one negotiation; a second one needs a handler of its own. Mutual authentication is demanded, and
-/// credentials are never delegated. For one thread at a time, any thread. Held by the shared pointer that
-/// `CreateSpnegoHandler` made; what it holds of the GSSAPI goes with it.
+/// The client's side of one negotiation; another negotiation needs another handler. Mutual authentication is requested,
+/// and credentials are never delegated. A handler may be used on any thread, but only on one at a time. It is owned by
+/// the shared pointer that `CreateSpnegoHandler` returns, and frees its GSSAPI objects when it is destroyed.
 ///
-/// `NegotiateLeg` makes the first leg when it is called with none of the service's; it asks the realm for tickets then,
-/// which takes as long as the Kerberos library waits for an answer. It raises
-/// - `GssCredentialException`, `GssNegotiationException` and `GssLimitException`, each when its comment says,
-/// - `Tarvel::InvalidArgumentException` when the first call comes with a leg of the service,
-/// - `Tarvel::InvalidStateException` once a call has failed.
-/// Its answer is empty when there is nothing to send: after the final leg, and when the service waits for the client
-/// although the negotiation is complete.
+/// `NegotiateLeg` makes the first leg when it is called with an empty leg of the service. That call asks the realm for
+/// tickets, and takes as long as the Kerberos library waits for an answer. It throws
+/// - `GssCredentialException`, `GssNegotiationException` and `GssLimitException`, as their comments say,
+/// - `Tarvel::InvalidArgumentException` when the service's leg is not empty in the first call,
+/// - `Tarvel::InvalidStateException` when an earlier call has failed.
+///
+/// It returns an empty leg when there is nothing to send: after the final leg, and when the service waits for the
+/// client although the negotiation is complete.
 class SSOCLIENT_GSSAPI_API SpnegoHandler : public NegotiationHandler {
 public:
-  /// Whether the negotiation is complete and the service has proved who it is. A service that issues a token without a
-  /// final leg may leave this out: a token that is signed by a trusted certificate is good all the same, but whoever must
-  /// know whom he has spoken to asks here, once the operation has returned.
+  /// Whether the negotiation is complete and the service has proved its identity. A service may issue a token and leave
+  /// out the final leg, which holds this proof. The token is valid all the same if it is signed with a trusted
+  /// certificate. Call this after the operation has returned if you need proof of the service's identity.
   virtual bool IsMutuallyAuthenticated() const noexcept = 0;
 
   /// @throws GssNegotiationException unless `IsMutuallyAuthenticated`.
@@ -65,10 +67,10 @@ protected:
   ~SpnegoHandler() = default;
 };
 
-/// A handler for one negotiation. Credentials are not looked for yet. The process's environment is not changed, here or
-/// later.
-/// @throws Tarvel::InvalidArgumentException for a service that is empty or lacks one of its parts, a text with a null
-///         character in it, and limits that are not positive.
+/// Creates a handler for one negotiation. It looks for credentials at the first leg, not here. The process's
+/// environment is never changed.
+/// @throws Tarvel::InvalidArgumentException for a service name that is empty or lacks a part, for a text that contains
+///         a null character, and for a limit that is not positive.
 SSOCLIENT_GSSAPI_API std::shared_ptr<SpnegoHandler> CreateSpnegoHandler(const SpnegoSettings &settings);
 
 } // namespace SsoClient::Gssapi

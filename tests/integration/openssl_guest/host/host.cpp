@@ -82,7 +82,7 @@ public:
     m_stream = context->CreateStream(socket, "localhost:" + std::to_string(g_port));
   }
 
-  std::string ShakeHands() {
+  std::string Handshake() {
     Testing::Completion handshake;
     m_stream->AsyncHandshake("localhost", "", handshake.ForEnd());
     return Describe(handshake);
@@ -169,13 +169,13 @@ void AskService() {
 
 void WaitInHandshake() {
   const auto connection = std::make_shared<Connection>(CreateTrustingContext());
-  g_host.Start([connection] { std::cout << "handshake: " << connection->ShakeHands() << std::endl; });
+  g_host.Start([connection] { std::cout << "handshake: " << connection->Handshake() << std::endl; });
   WaitForServer();
 }
 
 void WaitInRead() {
   const auto connection = std::make_shared<Connection>(CreateTrustingContext());
-  connection->ShakeHands();
+  connection->Handshake();
   const Testing::Completion read = connection->BeginRead();
   g_host.Start([connection, read] {
     std::cout << "read: " << Connection::Describe(read) << std::endl;
@@ -187,12 +187,12 @@ void WaitInRead() {
 void BeginAtEnd() {
   const auto context = CreateTrustingContext();
   const auto connection = std::make_shared<Connection>(context);
-  connection->ShakeHands();
+  connection->Handshake();
   const auto fresh = std::make_shared<Connection>(context);
   g_host.atEnd.emplace_back([=] {
     std::cout << "read: " << connection->Read() << std::endl;
     std::cout << "write: " << connection->Write() << std::endl;
-    std::cout << "handshake: " << fresh->ShakeHands() << std::endl;
+    std::cout << "handshake: " << fresh->Handshake() << std::endl;
     connection->Close();
     Report("stream", [&] { const Connection another(context); });
     Report("context", [] { CreateTrustingContext(); });
@@ -219,8 +219,8 @@ void FirstUseAtEnd() {
       [] { Report("first use", [] { Tarvel::Crypto::LoadCertificates(DataPath("tokens/sts-rsa.crt")); }); });
 }
 
-void ShakeHands() {
-  std::cout << "handshake: " << Connection(CreateTrustingContext()).ShakeHands() << std::endl;
+void Handshake() {
+  std::cout << "handshake: " << Connection(CreateTrustingContext()).Handshake() << std::endl;
 }
 
 /// One of each kind.
@@ -241,7 +241,7 @@ void UseEverything() {
                                                   Tarvel::Crypto::LoadPrivateKey(DataPath("tls/client.key")),
                                                   Tarvel::Crypto::LoadCertificates(DataPath("tls/intermediate.crt")));
   });
-  ShakeHands();
+  Handshake();
 }
 
 void AskForConfigurationOnManyThreads() {
@@ -272,7 +272,7 @@ constexpr Deed DEEDS[] = {
     {"begin-at-end", BeginAtEnd},
     {"verify-at-end", VerifyAtEnd},
     {"first-use-at-end", FirstUseAtEnd},
-    {"shake-hands", ShakeHands},
+    {"shake-hands", Handshake},
     {"use-everything", UseEverything},
     {"host-loads-configuration", LoadConfigurationOfHost},
     {"use-system-configuration", [] { Report("configuration", Tarvel::Crypto::UseSystemConfiguration); }},

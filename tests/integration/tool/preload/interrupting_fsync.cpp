@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
-// Preloaded into the tool by a test: the process gets the signal whose number is in the environment while it has a file
-// written and not yet put in its place.
+// A test preloads this into the tool. It sends the process a signal, whose number is in the environment, when a file
+// has been written and does not have its final name yet.
 
 #include <csignal>
 #include <cstdlib>
