@@ -40,7 +40,7 @@ std::optional<std::string> DescribeLowerFailure(const Exception *exception) noex
 
 } // namespace
 
-// Always on an I/O thread: each thread has an error queue of OpenSSL's, and the host's threads may have entries in theirs.
+// Always on an I/O thread: OpenSSL has an error queue for each thread, and those of the host's threads may have entries.
 void SSLStreamImpl::PostPump() {
   boost::asio::post(System::GetIoContext(),
                     [self = Ref(this)] { self->Advance([&self](Completions &done) { self->Pump(done); }); });
