@@ -38,7 +38,8 @@ std::string RefuseTarget(std::string_view host, int port) {
 }
 
 std::optional<boost::asio::ip::address> ParseAddress(std::string_view host) {
-  const std::string_view text = IsInBrackets(host) ? host.substr(1, host.size() - 2) : host;
+  // A string: given a view, `make_address` makes a copy itself, where a lack of memory would end the process (`noexcept`).
+  const std::string text(IsInBrackets(host) ? host.substr(1, host.size() - 2) : host);
   boost::system::error_code notAnAddress;
   const boost::asio::ip::address address = boost::asio::ip::make_address(text, notAnAddress);
   return notAnAddress ? std::nullopt : std::optional(address);
