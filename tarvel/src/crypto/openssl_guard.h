@@ -43,7 +43,7 @@ public:
 
 private:
   const Computation m_computing;
-  std::atomic<std::uint32_t> *m_count; // of the shard where the use began; null if it is not allowed
+  std::atomic<std::uint32_t> *m_count; // of the shard where the use began; null if the use is suspended or not allowed
 };
 
 } // namespace Tarvel::Crypto
