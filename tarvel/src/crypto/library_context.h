@@ -15,7 +15,8 @@ OSSL_LIB_CTX *GetLibraryContext() noexcept;
 /// Whether the host has asked for the machine's configuration. Final after `OpenSslGuard::Prepare`.
 bool UsesSystemConfiguration() noexcept;
 
-/// Called once, by `OpenSslGuard::Prepare`. @throws OutOfMemoryException, CryptoException
+/// Called by `OpenSslGuard::Prepare` until it has succeeded once. @throws OutOfMemoryException, CryptoException;
+/// InvalidStateException when OpenSSL has cleaned itself up.
 void InitialiseOpenSsl();
 
 /// While it lives, the thread that created it uses our library context in OpenSSL functions without such an argument.

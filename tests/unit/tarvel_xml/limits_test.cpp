@@ -78,7 +78,7 @@ TEST(XMLParser, CountsAttributesDespiteQuotesAndMarkupInValues) {
 }
 
 TEST(XMLParser, RefusesTheShortestStartTagWithTooManyAttributes) {
-  // Names are repeated, since 257 names of one byte do not exist; the repetition is refused at the end of the tag.
+  // The name is repeated, because there are not 257 names of one byte. A repetition is refused at the end of the tag.
   EXPECT_THROWS_MESSAGE(ParseDocument("<a" + Repeat(" a=\"\"", 257) + "/>"), XMLParseException,
                         "an element has more than 256 attributes at line 1, column 1");
   EXPECT_THROWS_MESSAGE(ParseDocument("<a" + Repeat(" a=\"\"", 256) + "/>"), XMLParseException,
