@@ -54,10 +54,10 @@ CertificateHandle Decode(const std::vector<std::uint8_t> &der) {
   return native;
 }
 
-// OpenSSL also reads BER. To code that compares bytes, two encodings of one certificate would be two certificates.
+// OpenSSL also reads BER. Code that compares bytes would treat two encodings of one certificate as two certificates.
 void RequireCanonical(X509 *native, const std::vector<std::uint8_t> &der) {
   const OpenSslErrorScope errors;
-  i2d_re_X509_tbs(native, nullptr); // makes the next line encode again instead of returning the bytes that were read
+  i2d_re_X509_tbs(native, nullptr); // makes i2d_X509 encode again instead of returning the bytes that were read
   unsigned char *encoded = nullptr;
   const int length = i2d_X509(native, &encoded);
   const MemoryHandle owner(encoded);
@@ -109,7 +109,7 @@ KeyKind FindKeyKind(EVP_PKEY *key) {
   return EVP_PKEY_is_a(key, "EC") ? FindCurve(key) : KeyKind::OTHER;
 }
 
-// With an exponent of 1 anyone can sign, and no private key has an even one (RFC 8017, section 3.1).
+// With the exponent 1, anyone can sign; for an even exponent, there is no private key (RFC 8017, section 3.1).
 bool IsExponentSound(EVP_PKEY *key) {
   const OpenSslErrorScope errors;
   BIGNUM *read = nullptr;
@@ -136,7 +136,7 @@ BioHandle NewMemoryBio() {
 }
 
 std::string DescribeName(const X509_NAME *name) {
-  // RFC 2253 allows UTF-8; OpenSSL's own flags for it would escape every byte beyond ASCII.
+  // RFC 2253 allows UTF-8, but OpenSSL's flags for RFC 2253 would escape every byte beyond ASCII.
   constexpr unsigned long FLAGS = XN_FLAG_RFC2253 & ~static_cast<unsigned long>(ASN1_STRFLGS_ESC_MSB);
   const OpenSslGuard guard;
   guard.Require();

@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// The only implementation of `Certificate`, based on OpenSSL's.
+/// The only implementation of `Certificate`, based on OpenSSL.
 
 #pragma once
 
@@ -14,7 +14,7 @@ namespace Tarvel::Crypto {
 
 class CertificateImpl final : public Certificate {
 public:
-  /// @throws CryptoException when `data` is not the DER encoding of one certificate, whole and canonical;
+  /// @throws CryptoException when `data` is not exactly one certificate in DER;
   ///         InvalidStateException when OpenSSL has cleaned itself up; OutOfMemoryException.
   CertificateImpl(const std::uint8_t *data, std::size_t length);
 

@@ -22,8 +22,8 @@ constexpr std::size_t DigestBytes(DigestAlgorithm algorithm) noexcept {
   return algorithm == DigestAlgorithm::SHA256 ? 32 : algorithm == DigestAlgorithm::SHA384 ? 48 : 64;
 }
 
-/// A digest that is being computed. For one thread, and only as a local variable: another use of OpenSSL that the thread
-/// begins during its life must also end during its life.
+/// A digest that is being computed. For one thread, and only as a local variable: if the thread begins another use of
+/// OpenSSL while the digest exists, that use must end before the digest is destroyed.
 class Digest {
 public:
   /// @throws CryptoException when the cryptographic library does not offer the algorithm; InvalidStateException when it has
@@ -34,7 +34,7 @@ public:
   ~Digest();
 
   /// Adds `bytes` to the message.
-  /// @throws CryptoException, OutOfMemoryException; `Finish` as well.
+  /// @throws CryptoException, OutOfMemoryException. `Finish` throws the same.
   void Update(std::string_view bytes);
 
   /// Writes `DigestBytes(algorithm)` bytes to `out`; the digest must not be used afterwards.

@@ -12,10 +12,11 @@
 
 namespace Tarvel::Crypto {
 
-/// A pool of contexts: creating one costs allocations, and atomic operations on counters that all threads share. A context
-/// serves one thread at a time. A thread acquires one, that of its own shard if possible, uses it and returns it.
-/// `Handle` is one of the owning handles; there are `KINDS` kinds of contexts, numbered from 0. Lock-free; safe on any
-/// thread. The destructor frees nothing, so that a static object never calls OpenSSL after the end of `main`.
+/// A pool of contexts, because creating a context costs allocations and atomic operations on counters that all threads
+/// share. A thread acquires a context, from its own shard if possible, uses it and returns it. No other thread uses it
+/// until then. `Handle` is one of the owning handles; there are `KINDS` kinds of contexts, numbered from 0. Lock-free;
+/// safe on any thread. The destructor frees nothing, so that a static object never calls OpenSSL after the end of
+/// `main`.
 template <typename Handle, std::size_t KINDS>
 class KeptContexts {
 public:
@@ -23,7 +24,7 @@ public:
   KeptContexts(const KeptContexts &) = delete;
   KeptContexts &operator=(const KeptContexts &) = delete;
 
-  /// A kept context of that kind; null if there is none.
+  /// A kept context of kind number `kind`; null if there is none.
   Handle Acquire(std::size_t kind) noexcept {
     for (std::size_t distance = 0; distance < SHARDS; ++distance) {
       Slot &slot = GetSlot(distance, kind);
@@ -59,7 +60,7 @@ public:
   }
 
 private:
-  static constexpr std::size_t SHARDS = 4; // if more threads use one kind at once, the others make their own
+  static constexpr std::size_t SHARDS = 4; // if more threads use one kind at once, the rest create contexts
 
   using Pointer = typename Handle::pointer;
   using Slot = std::atomic<Pointer>;

@@ -13,8 +13,8 @@
 
 namespace Tarvel::Crypto {
 
-/// Contexts for one key and one operation, which is checking signatures or making them. Setting up a context costs a fifth of
-/// an RSA check, so contexts are kept for reuse. Lock-free; safe on any thread.
+/// Contexts for one key and one operation: either checking signatures or making them. Setting up a context costs a
+/// fifth of an RSA check, so contexts are kept for reuse. Lock-free; safe on any thread.
 class KeyContexts {
 public:
   KeyContexts() = default;

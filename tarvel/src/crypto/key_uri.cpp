@@ -20,7 +20,8 @@ namespace {
 constexpr std::string_view SCHEME_LETTERS = "ABCDEFGHIJKLMNOPQRSTUVWXYZabcdefghijklmnopqrstuvwxyz";
 constexpr std::string_view SCHEME_CHARACTERS = "ABCDEFGHIJKLMNOPQRSTUVWXYZabcdefghijklmnopqrstuvwxyz0123456789+-.";
 
-// The state of the callback for a passphrase. It stores its exception, which must not pass through OpenSSL's frames.
+// The state of the callback for a passphrase. An exception of the callback is stored here, because it must not pass
+// through OpenSSL's stack frames.
 struct PassphraseQuestion {
   Passphrase passphrase;
   bool asked = false;
@@ -93,7 +94,7 @@ Ref<const PrivateKey> LoadPrivateKeyFromUri(const std::string &uri, const Passph
   guard.Require();
   const OpenSslErrorScope errors;
   PassphraseQuestion question{Passphrase(passphrase, guard), false, nullptr};
-  // Without this method, a loader would ask on the host's terminal.
+  // Without this user-interface method, a loader would ask for the passphrase on the host's terminal.
   const UiMethodHandle ui(UI_UTIL_wrap_read_pem_callback(AnswerPassphrase, 0));
   if (!ui) {
     throw OutOfMemoryException();

@@ -10,12 +10,12 @@
 
 namespace Tarvel::Crypto {
 
-/// Whether `text` begins with a URI scheme (RFC 3986, section 3.1) of two or more characters and a colon. A file of
-/// such a name is written "./name".
+/// Whether `text` begins with a URI scheme (RFC 3986, section 3.1) of two or more characters and a colon. The path of a
+/// file with such a name must be written as "./name".
 bool IsKeyUri(const std::string &text);
 
-/// @throws NoKeyException, WrongPassphraseException, CryptoException, IOException as `LoadPrivateKey` does, without the URI
-/// in the message.
+/// @throws NoKeyException, WrongPassphraseException, CryptoException, IOException when `LoadPrivateKey` does, but
+/// without the URI in the message.
 Ref<const PrivateKey> LoadPrivateKeyFromUri(const std::string &uri, const PassphraseCallback &passphrase);
 
 } // namespace Tarvel::Crypto

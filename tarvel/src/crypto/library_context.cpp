@@ -26,13 +26,14 @@ std::atomic<Configuration> configuration{Configuration::UNDECIDED};
 // Never freed: threads that run until the process ends use it.
 std::atomic<OSSL_LIB_CTX *> libraryContext{nullptr};
 
-/// The decision, which is `wanted` if none was made before.
+/// Decides for `wanted` if no decision was made before. Returns the decision that was made first.
 Configuration Decide(Configuration wanted) noexcept {
   Configuration decided = Configuration::UNDECIDED;
   return configuration.compare_exchange_strong(decided, wanted) ? wanted : decided;
 }
 
-/// Throws if the default provider cannot be loaded: without one, OpenSSL would use the providers of its default context.
+/// Throws if the default provider cannot be loaded. It must not return null: OpenSSL would then use its default
+/// context, with the providers there.
 OSSL_LIB_CTX *CreateLibraryContext(const OpenSslErrorScope &errors) {
   OSSL_LIB_CTX *const context = OSSL_LIB_CTX_new();
   if (!context || !OSSL_PROVIDER_load(context, "default")) {
@@ -56,8 +57,8 @@ void InitialiseOpenSsl() {
   const OpenSslErrorScope errors;
   const bool isOfSystem = Decide(Configuration::NONE) == Configuration::OF_SYSTEM;
   const std::uint64_t configurationFlag = isOfSystem ? OPENSSL_INIT_LOAD_CONFIG : OPENSSL_INIT_NO_LOAD_CONFIG;
-  // OpenSSL reads its configuration with the first context for TLS, unless a flag forbids it. Only the first such flag
-  // in a process has an effect.
+  // OpenSSL reads its configuration when the first context for TLS is created, unless a flag forbids it. Only the first
+  // such flag in a process has an effect.
   const bool isUsable = OPENSSL_init_crypto(0, nullptr) == 1; // false after its clean-up, or without memory
   if (!isUsable || OPENSSL_init_ssl(configurationFlag, nullptr) != 1) {
     static std::atomic<bool> lackedMemory{false}; // OpenSSL does not retry what has failed once

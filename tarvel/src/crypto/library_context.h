@@ -8,17 +8,18 @@
 
 namespace Tarvel::Crypto {
 
-/// The argument for every OpenSSL function that takes a library context. Null, which means OpenSSL's default context, before
-/// `OpenSslGuard::Prepare`, and when the machine's configuration applies. Costs one load.
+/// The argument for every OpenSSL function that takes a library context. It is null, which means OpenSSL's default
+/// context, before `OpenSslGuard::Prepare` and if the machine's configuration applies. The call costs one load.
 OSSL_LIB_CTX *GetLibraryContext() noexcept;
 
 /// Whether the host has asked for the machine's configuration. Final after `OpenSslGuard::Prepare`.
 bool UsesSystemConfiguration() noexcept;
 
-/// Called once, by `OpenSslGuard::Prepare`. @throws OutOfMemoryException, CryptoException
+/// Called by `OpenSslGuard::Prepare` until it has succeeded once. @throws OutOfMemoryException, CryptoException;
+/// InvalidStateException when OpenSSL has cleaned itself up.
 void InitialiseOpenSsl();
 
-/// While it lives, the calling thread uses our library context in OpenSSL functions that take no such argument.
+/// While it lives, the thread that created it uses our library context in OpenSSL functions without such an argument.
 class LibraryContextScope {
 public:
   LibraryContextScope() noexcept;

@@ -8,14 +8,15 @@
 
 namespace Tarvel::Crypto {
 
-/// Calls a function when OpenSSL cleans itself up: on the thread that ends the process, when no use of OpenSSL can begin and
-/// those under way have ended. The function is not called in a child process that is forked later.
+/// Calls a function when OpenSSL cleans itself up. The call is on the thread that runs the clean-up, when no use of
+/// OpenSSL can begin any more, and those under way have ended or were waited for long enough. The function is not
+/// called in a child process that is forked later.
 class OpenSslEndNotice {
 public:
   using Function = void (*)(void *owner) noexcept;
 
-  /// Until `Withdraw` has returned, `function` may be called with `owner`, at most once. It must not create or withdraw a
-  /// notice.
+  /// Until `Withdraw` has returned, `function` may be called with `owner`, at most once. The function must not create
+  /// or withdraw a notice.
   OpenSslEndNotice(Function function, void *owner) noexcept;
   OpenSslEndNotice(const OpenSslEndNotice &) = delete;
   OpenSslEndNotice &operator=(const OpenSslEndNotice &) = delete;
@@ -31,7 +32,7 @@ private:
   const Function m_function;
   void *const m_owner;
   const unsigned m_generation = GetForkGeneration();
-  // In a list of all notices, guarded by its mutex.
+  // The neighbours in a list of all notices. A mutex guards the list.
   OpenSslEndNotice *m_previous = nullptr;
   OpenSslEndNotice *m_next = nullptr;
 };

@@ -14,7 +14,7 @@ namespace Tarvel::Crypto {
 
 namespace {
 
-constexpr std::size_t ERROR_TEXT_BYTES = 256; // enough, as OpenSSL documents
+constexpr std::size_t ERROR_TEXT_BYTES = 256; // enough, according to OpenSSL's documentation
 
 std::string DescribeError(unsigned long code, const char *data, int flags) {
   std::array<char, ERROR_TEXT_BYTES> text{};

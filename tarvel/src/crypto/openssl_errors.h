@@ -28,8 +28,8 @@ public:
   /// OpenSSL's code for the newest error since the scope began; 0 when there is none.
   unsigned long PeekNewest() const noexcept;
 
-  /// OpenSSL's texts for all errors since the scope began, oldest first. If the queue had errors of the host, only the newest:
-  /// the older ones cannot be read without removing those of the host.
+  /// OpenSSL's texts for all errors since the scope began, oldest first. If the queue had errors of the host, only the
+  /// newest text is returned: the older errors cannot be read without removing those of the host.
   std::string TakeText() const;
 
   /// @throws OutOfMemoryException when memory ran out.
@@ -46,7 +46,7 @@ private:
   void Note(unsigned long code, const char *data, int flags) const;
 
   const int m_errnoOfHost;
-  const char *m_newestOfHost = nullptr; // identifies an entry: its own copy of a file name; null if there is none
+  const char *m_newestOfHost = nullptr; // identifies an entry by its own copy of a file name; null if there is none
   // What has been collected so far.
   mutable bool m_ranOutOfMemory = false;
   mutable unsigned long m_newest = 0;

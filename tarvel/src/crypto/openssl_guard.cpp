@@ -101,7 +101,8 @@ void OpenSslGuard::Abandon(void *object) noexcept {
 }
 
 void OpenSslGuard::Prepare() {
-  // Before `call_once`: inside it, a thread could wait for a fork that waits for a thread that waits for `call_once`.
+  // Begins before `call_once`. Otherwise the thread inside it could wait for a fork, the fork for the computation of a
+  // second thread, and that thread for `call_once`.
   const Computation computing;
   static std::once_flag registered;
   std::call_once(registered, [] {

@@ -21,10 +21,11 @@ public:
   OpenSslGuard &operator=(const OpenSslGuard &) = delete;
   ~OpenSslGuard();
 
-  /// False once the clean-up has begun: then OpenSSL must not be called any more, not even to free what it made.
+  /// Whether OpenSSL may be called. False if the clean-up began before the use or before `Resume`, and while the use is
+  /// suspended. OpenSSL must then not be called even to free what it made.
   explicit operator bool() const noexcept { return m_count != nullptr; }
 
-  /// @throws InvalidStateException with the text `ENDED` once the clean-up has begun.
+  /// @throws InvalidStateException with the text `ENDED` when OpenSSL must not be called.
   void Require() const;
 
   static constexpr const char *ENDED = "OpenSSL has cleaned itself up: the process is about to end";
@@ -43,7 +44,7 @@ public:
 
 private:
   const Computation m_computing;
-  std::atomic<std::uint32_t> *m_count; // of the shard where the use began; null if it is not allowed
+  std::atomic<std::uint32_t> *m_count; // of the shard where the use began; null if the use is suspended or not allowed
 };
 
 } // namespace Tarvel::Crypto

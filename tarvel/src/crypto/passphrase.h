@@ -16,7 +16,7 @@ namespace Tarvel::Crypto {
 /// Asks its callback at most once, on the thread that first needs the passphrase.
 class Passphrase {
 public:
-  /// Both must outlive this object. `guard` is suspended while `ask` runs.
+  /// `ask` and `guard` must outlive this object. `guard` is suspended while `ask` runs.
   Passphrase(const PassphraseCallback &ask, OpenSslGuard &guard) : m_ask(ask), m_guard(guard) {}
   Passphrase(const Passphrase &) = delete;
   Passphrase &operator=(const Passphrase &) = delete;

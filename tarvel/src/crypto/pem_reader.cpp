@@ -59,7 +59,7 @@ bool PemReader::Next(PemBlock &block) {
   const OpenSslErrorScope errors;
   if (PEM_read_bio_ex(m_bio.get(), &block.m_label, &block.m_headers, &block.m_data, &block.m_length,
                       PEM_FLAG_SECURE | PEM_FLAG_EAY_COMPATIBLE) != 1) {
-    // Also if OpenSSL finds no further block: a truncated begin line must not hide a certificate of a bundle.
+    // Throws also if OpenSSL finds no further block: a truncated begin line must not hide a certificate of a bundle.
     errors.Throw("Malformed PEM text");
   }
   block.m_allocated = block.m_length;

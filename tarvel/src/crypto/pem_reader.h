@@ -52,7 +52,8 @@ public:
   explicit PemReader(std::string_view text);
 
   /// Reads the next block into `block`; false at the end of the text.
-  /// @throws CryptoException when a block has begun but is not well-formed; otherwise as the constructor.
+  /// @throws CryptoException when a block has begun but is not well-formed; InvalidStateException and
+  ///         OutOfMemoryException like the constructor.
   bool Next(PemBlock &block);
 
   static bool LooksLikePem(std::string_view text) { return text.find(BEGIN_MARK) != std::string_view::npos; }

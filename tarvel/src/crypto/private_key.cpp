@@ -86,7 +86,8 @@ KeyHandle DecodeEncryptedOrThrow(std::string_view der, Passphrase &passphrase) {
   return Decrypt(encrypted.get(), passphrase);
 }
 
-// The traditional form has its cipher in headers (RFC 1421), and is decrypted in place.
+// The traditional form has its cipher in headers (RFC 1421), and is decrypted in place. Returns whether it was
+// encrypted.
 bool DecryptInPlace(PemBlock &block, Passphrase &passphrase) {
   const OpenSslErrorScope errors;
   EVP_CIPHER_INFO cipher{};

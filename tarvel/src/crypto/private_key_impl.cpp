@@ -15,7 +15,7 @@ PrivateKeyImpl::PrivateKeyImpl(KeyHandle native) : m_native(std::move(native)) {
   guard.Require();
   const OpenSslErrorScope errors;
   m_bits = static_cast<unsigned>(EVP_PKEY_get_bits(m_native.get()));
-  if (m_bits == 0) { // OpenSSL sets the size when it reads a key; if memory runs out, it stays 0 without an error
+  if (m_bits == 0) { // OpenSSL sets the size when it reads a key; if memory runs out, the size stays 0 without an error
     throw OutOfMemoryException();
   }
   for (const char *const algorithm : {"RSA", "EC"}) {

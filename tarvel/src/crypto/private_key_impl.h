@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// The only implementation of `PrivateKey`, based on OpenSSL's.
+/// The only implementation of `PrivateKey`, based on OpenSSL.
 
 #pragma once
 
@@ -29,7 +29,7 @@ private:
 
   const char *m_algorithm = nullptr;
   unsigned m_bits = 0;
-  KeyHandle m_native; // OpenSSL wipes the numbers when it frees them
+  KeyHandle m_native; // OpenSSL wipes the key's numbers when it frees them
   mutable KeyContexts m_signContexts;
 };
 

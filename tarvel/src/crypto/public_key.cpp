@@ -33,7 +33,8 @@ bool MatchesScheme(KeyKind kind, SignatureScheme scheme) {
   return IsRsaScheme(scheme) ? kind == KeyKind::RSA : IsCurve(kind);
 }
 
-// The octets of the modulus, or of r and s each: the curve's order rounded up (66 for P-521).
+// The number of octets of the modulus, or of each of r and s: the size in bits, rounded up to whole octets (66 for
+// P-521).
 std::size_t BytesOf(unsigned bits) {
   return (bits + BITS_PER_BYTE - 1) / BITS_PER_BYTE;
 }

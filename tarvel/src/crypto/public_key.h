@@ -27,10 +27,10 @@ KeyKind GetKeyKind(const Certificate &certificate, unsigned &bits);
 bool HasSoundExponent(const Certificate &certificate);
 
 /// Whether `signature` is the signature by the certificate's key over a message with that digest. An ECDSA value is r
-/// and s one after the other, as in XML Signature (RFC 4050, section 3.3). RSA-PSS: MGF1 with the same digest, salt
-/// as long as the digest. It is false for malformed values. Safe on any thread; costs little beyond the arithmetic.
+/// and s one after the other, as in XML Signature (RFC 4050, section 3.3). RSA-PSS uses MGF1 with the same digest, and
+/// a salt as long as the digest. False for malformed values. Safe on any thread; costs little beyond the arithmetic.
 /// @throws CryptoException when the cryptographic library itself fails; InvalidStateException when it has cleaned itself up;
-///         OutOfMemoryException. None of these is a verdict.
+///         OutOfMemoryException. An exception says nothing about the signature.
 bool VerifyDigest(const Certificate &certificate, SignatureScheme scheme, DigestAlgorithm algorithm,
                   const std::uint8_t *digest, const std::uint8_t *signature, std::size_t signatureLength);
 

@@ -31,7 +31,7 @@ bool IsIn(const Range (&ranges)[N], std::uint32_t character) noexcept {
                      [character](const Range &range) { return range.first <= character && character <= range.last; });
 }
 
-/// By byte: whether it is a letter, as nearly all characters of names are.
+/// For each byte, whether it is an ASCII letter. Nearly all characters of names are.
 constexpr std::array<bool, 256> IS_ASCII_LETTER = [] {
   std::array<bool, 256> letters{};
   for (unsigned letter = 0; letter < 26; ++letter) {
@@ -75,7 +75,7 @@ std::size_t CountPlainAscii(std::string_view text) noexcept {
   std::size_t offset = 0;
   for (std::uint64_t word = 0; text.size() - offset >= sizeof word; offset += sizeof word) {
     std::memcpy(&word, text.data() + offset, sizeof word);
-    if ((word | (word - BLANKS)) & HIGH_BITS) { // the subtraction borrows from the high bit of a control character
+    if ((word | (word - BLANKS)) & HIGH_BITS) { // for a control character, the subtraction sets the high bit
       break;
     }
   }

@@ -262,7 +262,7 @@ void DocumentReader::EndElement() {
   m_handler.EndElement();
 }
 
-/// Reads character data and CDATA sections up to the next other markup.
+/// Reads character data and CDATA sections up to the next markup of another kind.
 void DocumentReader::ReadText() {
   const char *const begin = m_cursor.GetPlace();
   m_gatherer.Begin(begin);
@@ -288,7 +288,7 @@ void DocumentReader::ReadText() {
     }
   }
   const std::string_view text = m_gatherer.End(m_cursor.GetPlace());
-  if (!text.empty()) { // an empty CDATA section alone makes no text
+  if (!text.empty()) { // empty CDATA sections without other text make no text node
     Count(begin);
     m_handler.Characters(text);
   }

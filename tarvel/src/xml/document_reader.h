@@ -11,8 +11,8 @@
 namespace Tarvel::Xml {
 
 /// Reads a document in one pass and passes its events to `handler`, all except `StartDocument` and `TakeResult`. Never reads
-/// beyond the end of `source`. Takes time linear in the length of the document, and memory for at most one text in which
-/// something was replaced.
+/// beyond the end of `source`. Takes time linear in the length of the document. If something in a text must be
+/// replaced, takes memory for one buffer, which is at most as long as the document.
 /// @param source outlives the call; texts in which nothing was replaced are passed to `handler` as views of it.
 /// @throws XMLParseException for the first error. What can only be checked as a whole (a name, a reference, a value, a tag)
 ///         is reported where it begins, everything else at the first byte that is not allowed. The length and the first four

@@ -19,7 +19,7 @@ namespace {
 
 constexpr std::size_t FLUSH_BYTES = 8 * 1024;
 
-/// A `FindEscaped`, which finds the first byte that is written as a reference.
+/// An instance of `FindEscaped`: finds the first byte that is written as a reference.
 using FindFunction = const char *(*)(const char *from, const char *end) noexcept;
 
 /// What is written as a reference, in each context.

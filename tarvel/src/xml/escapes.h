@@ -19,7 +19,8 @@ enum EscapeSet : std::uint8_t {
   ESCAPED_IN_ASCII = 4,     ///< every byte of a character beyond ASCII
 };
 
-/// By byte: the sets that it belongs to. Canonical XML 1.0, section 2.3, escapes the same characters as a serialiser must.
+/// For each byte, the sets that it belongs to. Canonical XML 1.0, section 2.3, escapes the same characters that a
+/// serialiser must escape.
 constexpr std::array<std::uint8_t, 256> ESCAPE_SETS = [] {
   std::array<std::uint8_t, 256> sets{};
   sets['&'] = sets['<'] = sets['\r'] = ESCAPED_IN_TEXT | ESCAPED_IN_ATTRIBUTE;
@@ -54,7 +55,7 @@ constexpr std::string_view EscapeOf(char character) noexcept {
 /// Most of a text needs no escape, so 16 bytes at a time are checked.
 using EscapeBlock = unsigned char __attribute__((vector_size(16)));
 
-/// Whether one of the bytes at `bytes`, as many as a block has, belongs to `SETS`, a combination of `EscapeSet`.
+/// Whether one of the 16 bytes from `bytes` on belongs to `SETS`, a combination of `EscapeSet`.
 template <unsigned SETS>
 inline bool HasEscaped(const char *bytes) noexcept {
   EscapeBlock block;
@@ -83,7 +84,7 @@ inline const char *FindEscaped(const char *from, const char *end) noexcept {
   while (static_cast<std::size_t>(end - from) >= BLOCK_BYTES && !HasEscaped<SETS>(from)) {
     from += BLOCK_BYTES;
   }
-  // The remaining bytes are the end of one more block if enough bytes precede them.
+  // If enough bytes precede the remaining ones, these are checked as the end of one more block.
   const bool isLastBlock = static_cast<std::size_t>(end - from) < BLOCK_BYTES;
   if (isLastBlock && static_cast<std::size_t>(end - begin) >= BLOCK_BYTES && !HasEscaped<SETS>(end - BLOCK_BYTES)) {
     return end;

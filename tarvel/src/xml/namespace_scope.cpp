@@ -113,8 +113,8 @@ void NamespaceScope::RefusePair(const AttributeEvent &first, const AttributeEven
   m_cursor.Refuse(Refusal::SAME_NAMESPACE_AND_NAME, second.name.data(), first.name, second.name);
 }
 
-// Attributes of one local name are adjacent once they are sorted, and among them those of one namespace after a second
-// sorting. Of all forbidden pairs, the one whose second attribute comes first is reported.
+// Sorting makes attributes with the same local name adjacent. Among these, a second sorting makes those of one
+// namespace adjacent. Of all forbidden pairs, the one whose second attribute comes first is reported.
 void NamespaceScope::CheckManyNames(const std::vector<AttributeEvent> &attributes) {
   SortByName(attributes);
   AttributePair firstPair{UNKNOWN, UNKNOWN};
@@ -170,7 +170,8 @@ NamespaceScope::AttributePair NamespaceScope::FindPair(const std::vector<Attribu
   return firstPair;
 }
 
-/// The declaration that represents the namespace that `prefix` is bound to; `UNKNOWN` when it is empty or not bound.
+/// The declaration that represents the namespace that `prefix` is bound to; `UNKNOWN` when `prefix` is empty or not
+/// bound.
 std::size_t NamespaceScope::FindNamespace(std::string_view prefix) {
   if (prefix.empty()) {
     return UNKNOWN;

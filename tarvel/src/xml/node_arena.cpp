@@ -20,7 +20,7 @@ constexpr std::size_t RoundUp(std::size_t size, std::size_t alignment) noexcept 
 
 } // namespace
 
-// The arena and its first memory are one allocation, so a node made alone costs only that one.
+// The arena and its first memory are one allocation, so a single node costs only one allocation.
 NodeArena *NodeArena::Create(std::size_t firstBytes, AfterUse afterUse) {
   const std::size_t capacity = RoundUp(firstBytes, ALIGNMENT);
   return new (::operator new(sizeof(NodeArena) + capacity)) NodeArena(capacity, afterUse);

@@ -26,7 +26,7 @@ class NodeArena {
 public:
   enum class AfterUse : std::uint8_t { FREE, WIPE_AND_FREE };
 
-  /// An arena without references. The caller takes the first one, with a `Ref` to the first node.
+  /// An arena without references. The caller adds the first one by creating a `Ref` to the first node.
   /// @param firstBytes the memory to allocate with the arena.
   /// @param afterUse whether the memory is overwritten before it is freed, because it may contain secrets.
   static NodeArena *Create(std::size_t firstBytes, AfterUse afterUse = AfterUse::FREE);
@@ -88,7 +88,8 @@ private:
   void FreeAll() noexcept;
 
   /// The arena that has the reference count of all arenas joined with this one. Joining always puts the smaller group below
-  /// the larger, so the path to it is at most logarithmic in their number, and readers need not shorten it.
+  /// the larger, so the path to the leader is at most logarithmic in the number of arenas, and readers need not shorten
+  /// it.
   NodeArena *GetLeader() noexcept {
     NodeArena *arena = this;
     while (arena->m_leader) {
@@ -98,11 +99,11 @@ private:
   }
   const NodeArena *GetLeader() const noexcept { return const_cast<NodeArena *>(this)->GetLeader(); }
 
-  std::atomic<std::uint32_t> m_references{0}; // a leader's: those to all of its group
+  std::atomic<std::uint32_t> m_references{0}; // of a leader: the references to all arenas of its group
   std::uint32_t m_groupSize = 1;
   NodeArena *m_leader = nullptr;
   NodeArena *m_nextInGroup = nullptr;
-  NodeArena *m_lastInGroup = this; // a leader's
+  NodeArena *m_lastInGroup = this; // only used for a leader
   char *m_free;
   char *m_end;
   Block *m_blocks = nullptr;

@@ -30,7 +30,7 @@ std::uint32_t GetDigit(char c) noexcept {
   return lower >= 'a' && lower <= 'f' ? static_cast<std::uint32_t>(lower - 'a') + 10 : NO_DIGIT;
 }
 
-/// Reads digits. A number beyond all characters stays beyond them, however many digits follow.
+/// Reads digits. A number that is too large for a character stays too large, however many digits follow.
 std::uint32_t ReadNumber(SourceCursor &cursor, std::uint32_t base) {
   constexpr std::uint32_t NO_CHARACTERS_FROM = 0x110000;
   if (cursor.IsAtEnd() || GetDigit(cursor.Peek()) >= base) {

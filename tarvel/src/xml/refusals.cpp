@@ -15,7 +15,8 @@ namespace {
 constexpr std::size_t NPOS = std::string_view::npos;
 constexpr std::string_view UTF8_MARK = "\xEF\xBB\xBF";
 
-/// Replaces `marker` by what was found, on one line: by references, a namespace name may contain any character.
+/// Replaces `marker` by what was found, with '?' in place of control characters: a namespace name may contain line
+/// ends, written as references, but the text must stay on one line.
 void FillIn(std::string &text, std::string_view marker, std::string_view found) {
   const std::size_t place = text.find(marker);
   if (place != NPOS) {
@@ -43,7 +44,7 @@ std::size_t GetByteOrderMarkLength(std::string_view source) noexcept {
 void Refuse(Refusal refusal, std::string_view source, std::size_t offset, std::string_view found,
             std::string_view alsoFound) {
   std::string text(REFUSAL_TEXTS[static_cast<std::size_t>(refusal)]);
-  FillIn(text, "%2", alsoFound); // first, since what was found may hold "%2"
+  FillIn(text, "%2", alsoFound); // first, because `found` may contain "%2"
   FillIn(text, "%1", found);
   const SourcePosition position = GetPosition(source, offset);
   throw XMLParseException(text, position.line, position.column);

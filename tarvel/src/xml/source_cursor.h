@@ -53,7 +53,8 @@ constexpr bool IsOfClass(char character, CharacterClass characterClass) noexcept
 // Most of a text is plain, so 16 bytes at a time are checked.
 using Block = signed char __attribute__((vector_size(16)));
 
-/// For each byte of `block`, whether it may not be plain. Control characters and bytes beyond ASCII never are.
+/// For each byte of `block`, whether it is possibly not plain. This includes all control characters and bytes beyond
+/// ASCII.
 template <CharacterClass PLAIN>
 inline Block FindDoubtfulBytes(Block block) noexcept {
   auto found = block < ' '; // bytes are signed here
@@ -79,7 +80,7 @@ struct WrittenName {
   std::string_view GetLocalName() const noexcept { return prefixLength ? text.substr(prefixLength + 1) : text; }
 };
 
-/// A position in a text, whose end is never read.
+/// A position in a text. Nothing beyond the end of the text is read.
 class SourceCursor {
 public:
   /// @param source outlives the cursor.
@@ -142,7 +143,8 @@ public:
     return isHere;
   }
 
-  /// Passes over the plain characters that come next, many at a time, and outside attribute values over line feeds.
+  /// Passes over the plain characters that come next, many at a time. Outside attribute values, it also passes over
+  /// line feeds.
   template <CharacterClass PLAIN>
   void SkipPlain() noexcept {
     const char *next = m_next;
@@ -211,8 +213,8 @@ public:
                            std::string_view alsoFound = {}) const;
 
 private:
-  /// The first byte from `next` on that may not be plain, or one up to seven bytes before it, or the beginning of the last
-  /// bytes, which fill no block.
+  /// The first byte from `next` on that is possibly not plain; on a big-endian machine, possibly a byte up to seven
+  /// before it. If no block has such a byte, the beginning of the last bytes, which do not fill a block.
   template <CharacterClass PLAIN>
   const char *SkipPlainBlocks(const char *next) const noexcept {
     constexpr bool IS_FIRST_BYTE_LOWEST = std::endian::native == std::endian::little;

@@ -66,7 +66,7 @@ private:
   void Append(std::string_view text) noexcept { m_free = std::copy(text.begin(), text.end(), m_free); }
 
   const char *m_sourceEnd;
-  const char *m_pieceBegin = nullptr; // where the source begins that is not copied yet
+  const char *m_pieceBegin = nullptr; // where the part of the source begins that is not copied yet
   std::unique_ptr<char[]> m_buffer;
   char *m_free = nullptr; // the end of all texts
   char *m_text = nullptr; // the beginning of the current text

@@ -12,7 +12,7 @@ namespace Tarvel::Xml {
 
 namespace {
 
-// Nodes take about as much memory as the text of a token; more is allocated on demand.
+// The nodes of a token take up to twice as much memory as its text. More is allocated on demand.
 constexpr std::size_t SMALLEST_ARENA_BYTES = 1024;
 constexpr std::size_t LARGEST_ARENA_BYTES = 64 * 1024;
 

@@ -128,7 +128,7 @@ TEST(CreateCertificateFromDer, RefusesAnEncodingThatIsOnlyBer) {
 
 TEST(CreateCertificateFromDer, RefusesBerInsideTheSignedPart) {
   std::string der = ReadFixture("rsa2048.crt.der");
-  // One byte more in the inner sequence's length, and so one more in the outer length.
+  // The length of the inner sequence takes one byte more, so the outer sequence is one byte longer.
   ASSERT_EQ(der.substr(4, 2), "\x30\x82");
   der[5] = '\x83';
   der.insert(6, 1, '\0');
@@ -137,7 +137,7 @@ TEST(CreateCertificateFromDer, RefusesBerInsideTheSignedPart) {
                         "Certificate is not in the distinguished encoding (DER)");
 }
 
-TEST(CreateCertificateFromDer, DecodesOrThrowsItsExceptionForEveryChangedByte) {
+TEST(CreateCertificateFromDer, DecodesOrThrowsCryptoExceptionForEveryChangedByte) {
   const std::string der = ReadFixture("p256.crt.der");
   int refused = 0;
   for (std::size_t at = 0; at < der.size(); ++at) {

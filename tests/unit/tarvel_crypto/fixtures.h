@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// The files of tests/data/crypto, as the tests read them.
+/// Functions that read the files of tests/data/crypto.
 
 #pragma once
 
@@ -25,7 +25,7 @@ inline std::string ReadFixture(const std::string &name) {
   return ReadDataFile("crypto/" + name);
 }
 
-/// The name of a fixture in the form that names of test cases have.
+/// The name of a fixture in a form that is allowed in the name of a test case.
 inline std::string TestName(std::string fixture) {
   std::replace_if(
       fixture.begin(), fixture.end(), [](char c) { return c == '-' || c == '.'; }, '_');

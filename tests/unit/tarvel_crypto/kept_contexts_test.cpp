@@ -50,7 +50,7 @@ TEST(KeptContexts, KeepTheKindsApart) {
   EXPECT_EQ(contexts.Acquire(1).release(), &context);
 }
 
-TEST(KeptContexts, HandOutTheContextOfAnotherThreadIfTheThreadHasNone) {
+TEST(KeptContexts, HandOutAContextThatAnotherThreadReturned) {
   Contexts contexts;
   Context context;
   std::thread([&] { contexts.Return(0, Handle(&context)); }).join();

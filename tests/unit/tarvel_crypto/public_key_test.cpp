@@ -58,7 +58,7 @@ protected:
   const Ref<const Certificate> m_certificate = FixtureCertificate(GetParam().key);
 };
 
-TEST_P(VerifyDigestTest, AcceptsAValueMadeByOpensslEachTime) {
+TEST_P(VerifyDigestTest, RepeatedlyAcceptsAValueMadeByOpenssl) {
   for (int round = 0; round < 3; ++round) {
     EXPECT_TRUE(VerifyValue(m_value));
   }

@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
-// Canonical forms that fill the canonicaliser's buffer and its table of namespaces, and the escapes that other engines leave
-// out. The expected forms are written by hand.
+// Canonical forms that fill the canonicaliser's buffer and its table of namespaces, and the escapes that other
+// implementations leave out. The expected forms are written by hand.
 
 #include "documents.h"
 
@@ -33,7 +33,7 @@ TEST(Canonicalize, WritesEachPieceAcrossTheEndOfTheBuffer) {
   }
 }
 
-// A text that is at least as long as the buffer is written without it.
+// A text that is at least as long as the buffer is written directly, without the buffer.
 TEST(Canonicalize, WritesATextAsLongAsTheBuffer) {
   for (std::size_t before = 0; before <= 2; ++before) {
     for (std::size_t length = BUFFER_BYTES - 8; length <= BUFFER_BYTES + 8; ++length) {
@@ -58,7 +58,7 @@ std::string Prefix(std::size_t number) {
   return "p" + std::string(3 - digits.size(), '0') + digits;
 }
 
-constexpr std::size_t MANY_PREFIXES = 200; // more than the table has buckets: some collide
+constexpr std::size_t MANY_PREFIXES = 200; // more than the table has buckets, so some collide
 
 TEST(Canonicalize, FindsEachOfManyPrefixesInScope) {
   std::string declarations;

@@ -19,7 +19,7 @@ using Testing::CanonicalForm;
 constexpr std::string_view ALL_ALGORITHMS[] = {Uri::INCLUSIVE, Uri::INCLUSIVE_WITH_COMMENTS, Uri::EXCLUSIVE,
                                                Uri::EXCLUSIVE_WITH_COMMENTS};
 
-TEST(CreateCanonicalizer, RefusesAnotherAlgorithmByName) {
+TEST(CreateCanonicalizer, RefusesAndNamesAnotherAlgorithm) {
   EXPECT_THROWS_MESSAGE(CreateCanonicalizer("http://www.w3.org/2006/12/xml-c14n11"), XmlSecurityException,
                         "The canonicalization algorithm \"http://www.w3.org/2006/12/xml-c14n11\" is not accepted");
   EXPECT_THROWS_MESSAGE(CreateCanonicalizer(""), XmlSecurityException,
@@ -62,7 +62,7 @@ TEST(Canonicalize, RefusesARelativeNamespaceNameOfAnAncestor) {
   }
 }
 
-TEST(Canonicalize, RefusesAnUndeclaredPrefixInATreeMadeByHand) {
+TEST(Canonicalize, RefusesAPrefixBoundToTheEmptyNameInATreeMadeByHand) {
   Tarvel::Ref<Tarvel::Xml::ElementNode> element;
   Tarvel::Xml::CreateElementNode("", "a", element);
   element->DefineAttribute("xmlns:p", "");

@@ -64,7 +64,7 @@ TEST(CanonicalizeExample, WhiteSpaceInContentIsKept) {
   EXPECT_EQ(TEXT, CanonicalDocument(TEXT, Uri::INCLUSIVE));
 }
 
-// Without its attribute default for e9.
+// Without the default attribute that the example declares for e9.
 TEST(CanonicalizeExample, StartAndEndTags) {
   EXPECT_EQ(
       R"(<doc>
@@ -121,7 +121,7 @@ Second line</text>
                               Uri::INCLUSIVE));
 }
 
-// Without its encoding declaration: the parser accepts no encoding but UTF-8.
+// Without the encoding declaration of the example: the parser accepts no encoding but UTF-8 and its subset US-ASCII.
 TEST(CanonicalizeExample, Utf8Encoding) {
   EXPECT_EQ("<doc>\xC2\xA9</doc>", CanonicalDocument("<doc>&#169;</doc>", Uri::INCLUSIVE));
 }

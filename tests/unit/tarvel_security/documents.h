@@ -62,7 +62,7 @@ inline const Tarvel::Xml::ElementNode &FindElement(const Tarvel::Xml::Document &
   throw std::logic_error("no element " + std::string(localName));
 }
 
-/// `text` with the first `from`, which must occur in it, replaced.
+/// `text` with the first occurrence of `from` replaced by `to`. `from` must occur in it.
 inline std::string Replaced(std::string text, std::string_view from, std::string_view to) {
   const std::size_t at = text.find(from);
   if (at == std::string::npos) {

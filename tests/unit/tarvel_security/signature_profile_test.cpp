@@ -19,7 +19,7 @@ using Testing::Replaced;
 
 const std::string EXCLUSIVE_TRANSFORM = R"(<ds:Transform Algorithm="http://www.w3.org/2001/10/xml-exc-c14n#"/>)";
 
-TEST(Verify, RefusesEachOtherSignatureAlgorithmByName) {
+TEST(Verify, RefusesAndNamesEveryOtherSignatureAlgorithm) {
   for (const std::string uri :
        {"http://www.w3.org/2000/09/xmldsig#rsa-sha1", "http://www.w3.org/2000/09/xmldsig#dsa-sha1",
         "http://www.w3.org/2000/09/xmldsig#hmac-sha1", "http://www.w3.org/2001/04/xmldsig-more#hmac-sha256",
@@ -31,7 +31,7 @@ TEST(Verify, RefusesEachOtherSignatureAlgorithmByName) {
   }
 }
 
-TEST(Verify, RefusesEachOtherDigestAlgorithmByName) {
+TEST(Verify, RefusesAndNamesEveryOtherDigestAlgorithm) {
   for (const std::string uri :
        {"http://www.w3.org/2000/09/xmldsig#sha1", "http://www.w3.org/2001/04/xmldsig-more#md5",
         "http://www.w3.org/2001/04/xmldsig-more#sha224", "http://www.w3.org/2001/04/xmlenc#ripemd160", "urn:unknown"}) {
@@ -39,7 +39,7 @@ TEST(Verify, RefusesEachOtherDigestAlgorithmByName) {
   }
 }
 
-TEST(Verify, RefusesEachOtherTransformByName) {
+TEST(Verify, RefusesAndNamesEveryOtherTransform) {
   for (const std::string uri :
        {"http://www.w3.org/TR/1999/REC-xpath-19991116", "http://www.w3.org/2002/06/xmldsig-filter2",
         "http://www.w3.org/TR/1999/REC-xslt-19991116", "http://www.w3.org/2000/09/xmldsig#base64",
@@ -48,7 +48,7 @@ TEST(Verify, RefusesEachOtherTransformByName) {
   }
 }
 
-TEST(Verify, RefusesEachOtherCanonicalizationAlgorithmByName) {
+TEST(Verify, RefusesAndNamesEveryOtherCanonicalizationAlgorithm) {
   for (const std::string uri : {"http://www.w3.org/2006/12/xml-c14n11", "http://www.w3.org/2000/09/xmldsig#minimal"}) {
     EXPECT_EQ("The canonicalization algorithm \"" + uri + "\" is not accepted",
               Refusal("http://www.w3.org/2001/10/xml-exc-c14n#", uri));

@@ -26,7 +26,7 @@ void ReadSyntax(const std::string &text) {
   SignatureOf(*ParseDocument(text));
 }
 
-/// The message for `MINIMAL` with one text replaced, without its place.
+/// The message for `MINIMAL` with one text replaced, without the line and column at its end.
 std::string SyntaxMessage(std::string_view from, std::string_view to) {
   try {
     ReadSyntax(Replaced(MINIMAL, from, to));
@@ -54,7 +54,7 @@ TEST(CreateSignatureFromDom, ListsReferencesInDocumentOrder) {
   EXPECT_EQ("", signature->GetReferences()[1].uri);
 }
 
-// What a signature covers can be queried before anything is verified; here that is nothing.
+// A program can query what a signature covers before it verifies the signature. This one covers nothing.
 TEST(CreateSignatureFromDom, AcceptsASignatureWithoutReferences) {
   const std::size_t begin = MINIMAL.find("<ds:Reference");
   const std::size_t end = MINIMAL.find("</ds:SignedInfo>");

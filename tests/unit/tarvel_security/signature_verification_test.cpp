@@ -265,7 +265,7 @@ TEST(Verify, AnswersFalseForASignedDigestThatIsTooLong) {
   EXPECT_EQ("wrong", VerifyResigned("32-zeros-more"));
 }
 
-TEST(Verify, AnswersFalseForASignedDigestOfWhichOneBitDiffers) {
+TEST(Verify, AnswersFalseForASignedDigestWithOneWrongBit) {
   EXPECT_EQ("wrong", VerifyResigned("first-bit"));
   EXPECT_EQ("wrong", VerifyResigned("last-bit"));
 }
@@ -295,7 +295,7 @@ public:
   }
 };
 
-TEST(Verify, ThrowsItsOwnExceptionForAFailureOfCryptography) {
+TEST(Verify, ThrowsXmlSecurityExceptionForAFailureOfCryptography) {
   std::set<std::string> uris;
   EXPECT_THROWS_MESSAGE(SignatureOf(*ParseDocument(GenuineToken()))->Verify(BrokenResolver(), uris),
                         XmlSecurityException, "the key cannot be read");

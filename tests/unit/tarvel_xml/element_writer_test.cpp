@@ -105,7 +105,7 @@ TEST(WriteTo, WritesAReferenceAtEveryPositionOfAText) {
     std::string_view inText;
     std::string_view inAttributes;
   };
-  constexpr std::size_t LENGTH = 36; // two blocks of 16 bytes, which are checked at once, and a rest
+  constexpr std::size_t LENGTH = 36; // two blocks of 16 bytes, each of them checked at once, and a rest
   constexpr Case CASES[] = {{"&", "&amp;", "&amp;"}, {"<", "&lt;", "&lt;"},    {">", "&gt;", ">"},
                             {"\"", "\"", "&quot;"},  {"\r", "&#xD;", "&#xD;"}, {"\t", "\t", "&#x9;"},
                             {"\n", "\n", "&#xA;"},   {"\x7F", "\x7F", "\x7F"}, {"\xC3\xBC", "&#xFC;", "&#xFC;"}};

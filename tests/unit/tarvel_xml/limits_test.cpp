@@ -33,7 +33,7 @@ std::string Attributes(const std::string &prefix, std::size_t count, const std::
   return attributes;
 }
 
-TEST(XMLParser, AcceptsADocumentOfTheGreatestLengthAndNoLonger) {
+TEST(XMLParser, AcceptsADocumentOfTheGreatestLengthButNoLongerOne) {
   const std::string frame = "<a></a>";
   const std::string longest = "<a>" + std::string(MAX_DOCUMENT_BYTES - frame.size(), 'x') + "</a>";
   const auto document = ParseDocument(longest);
@@ -78,7 +78,7 @@ TEST(XMLParser, CountsAttributesDespiteQuotesAndMarkupInValues) {
 }
 
 TEST(XMLParser, RefusesTheShortestStartTagWithTooManyAttributes) {
-  // Names are repeated, since 257 names of one byte do not exist; the repetition is refused at the end of the tag.
+  // The name is repeated, because there are not 257 names of one byte. A repetition is refused at the end of the tag.
   EXPECT_THROWS_MESSAGE(ParseDocument("<a" + Repeat(" a=\"\"", 257) + "/>"), XMLParseException,
                         "an element has more than 256 attributes at line 1, column 1");
   EXPECT_THROWS_MESSAGE(ParseDocument("<a" + Repeat(" a=\"\"", 256) + "/>"), XMLParseException,
@@ -140,7 +140,7 @@ TEST(XMLParser, AcceptsManyUnboundPrefixesOnElementsWithLongNames) {
   EXPECT_NO_THROW(ParseDocument("<r>" + Repeat(tag, MAX_DOCUMENT_BYTES / tag.size() - 1) + "</r>"));
 }
 
-TEST(XMLParser, AcceptsTheLongestNamesAndNoLonger) {
+TEST(XMLParser, AcceptsTheLongestNamesButNoLongerOnes) {
   const std::string longest(MAX_NAME_BYTES, 'n');
   const std::string prefixed = "p:" + longest.substr(2);
   for (const std::string &name : {longest, prefixed}) {

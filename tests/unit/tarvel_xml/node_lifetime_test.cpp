@@ -1,5 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
-// How long nodes live, at which depth, and on how many threads.
+// The lifetime of nodes, deep and wide trees, and use on several threads.
 
 #include "nodes.h"
 #include "support/xml_tree.h"
@@ -56,7 +56,7 @@ TEST(Node, LeaksNoTreesAppendedCrosswise) {
   EXPECT_EQ(DescribeTree(*first->GetDocumentNode()), "(1:a(1:x(1:b(1:y(1:d comment=1:c)))))");
 }
 
-TEST(Node, IsComposedAndFreedInADepthOfAHundredThousandWithoutRecursion) {
+TEST(Node, IsComposedAndFreedAtADepthOfAHundredThousandWithoutRecursion) {
   constexpr int DEPTH = 100'000;
   Ref<ElementNode> top = MakeElement("a");
   const ElementNode *const bottom = top.get();

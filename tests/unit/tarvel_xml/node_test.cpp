@@ -96,7 +96,7 @@ TEST(SetValue, ReportsTheByteOfAForbiddenCharacterAtEveryPosition) {
 
 struct Forbidden {
   std::string value;
-  std::string message; // after the words for the text
+  std::string message; // what follows "the text" or "the value of the attribute ..."
 };
 
 const Forbidden FORBIDDEN[] = {
@@ -173,7 +173,7 @@ TEST(Attribute, ReportsItsPartsAndWhetherItDeclaresANamespace) {
   EXPECT_EQ(seen, "|x; p|y; |xmlns declares; xmlns|p declares; |xmlnsx; p|xmlns; ");
 }
 
-TEST(FindAttribute, FindsOnlyAttributesWithoutAPrefixInNoNamespace) {
+TEST(FindAttribute, FindsOnlyAttributesWithoutAPrefixForTheEmptyNamespace) {
   const auto document = ParseDocument("<a xmlns='urn:p' xmlns:p='urn:p' xmlns:q='urn:p' r:x='0' p:x='1' x='2'/>");
   const ElementNode &a = *document->GetDocumentElement();
   std::string_view value = "untouched";
@@ -284,7 +284,7 @@ TEST(AppendChild, RefusesNullDocumentsAndCycles) {
   }
 }
 
-TEST(AppendChild, RefusesCyclesOfNodesMadeAlone) {
+TEST(AppendChild, RefusesCyclesOfNodesThatWereMadeSeparately) {
   const Ref<ElementNode> a = MakeElement("a");
   const Ref<ElementNode> b = MakeElement("b");
   const Ref<ElementNode> c = MakeElement("c");

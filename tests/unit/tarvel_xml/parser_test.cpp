@@ -57,7 +57,7 @@ TEST(ParseDocument, MergesAdjacentTextAndCDataIntoOneNode) {
             "(1:a text=25:one & <two> & three \xC3\xA4\xE2\x82\xAC)");
 }
 
-TEST(ParseDocument, MakesNoTextNodeOfAnEmptyCDataSection) {
+TEST(ParseDocument, MakesNoTextNodeForAnEmptyCDataSection) {
   EXPECT_EQ(DescribeDocument("<a><![CDATA[]]></a>"), "(1:a)");
 }
 
@@ -79,7 +79,7 @@ TEST(ParseDocument, KeepsUnboundPrefixesInTheTree) {
   EXPECT_EQ(DescribeDocument("<p:a q:x='1' r:x='2'><s:b/></p:a>"), "(3:p:a @3:q:x=1:1 @3:r:x=1:2(3:s:b))");
 }
 
-TEST(ParseDocument, AcceptsTheXmlPrefixDeclaredAndUndeclared) {
+TEST(ParseDocument, AcceptsADeclarationOfTheXmlPrefix) {
   EXPECT_EQ(DescribeDocument("<a y='1' xmlns:xml='http://www.w3.org/XML/1998/namespace' xmlns:p='urn:p' "
                              "xml:space='preserve' xml:lang='de' xml:id='i'/>"),
             "(1:a @1:y=1:1 @9:xmlns:xml=36:http://www.w3.org/XML/1998/namespace @7:xmlns:p=5:urn:p "
@@ -171,7 +171,7 @@ TEST(XMLParser, PassesOnTheFailureOfItsReader) {
   EXPECT_THROWS_MESSAGE(CreateXMLParser(CreateXMLDocumentHandler())->Parse(*reader), IOException, "the line is cut");
 }
 
-/// Throws at the event of that name.
+/// Throws at the event with the given name, and records the events before it.
 class ThrowingHandler final : public XMLHandler {
 public:
   explicit ThrowingHandler(std::string event) : m_event(std::move(event)) {}

@@ -178,7 +178,7 @@ std::vector<Case> GetCases() {
       {R::UNKNOWN_ENTITY, "<a x='&LT;'/>", {"LT"}, 1, 7},
       {R::FORBIDDEN_REFERENCE, "<a>\n&#x0;</a>", {"&#x0;"}, 2, 1},
       {R::FORBIDDEN_REFERENCE, "<a>&#65534;</a>", {"&#65534;"}, 1, 4},
-      {R::FORBIDDEN_REFERENCE, "<a>&#4294967361;</a>", {"&#4294967361;"}, 1, 4}, // 'A' in 32 bits
+      {R::FORBIDDEN_REFERENCE, "<a>&#4294967361;</a>", {"&#4294967361;"}, 1, 4}, // would be 'A' in 32 bits
       {R::FORBIDDEN_REFERENCE, "<a>&#x110000;</a>", {"&#x110000;"}, 1, 4},
       {R::ENDS_IN_REFERENCE, "<a>&", {}, 1, 5},
       {R::ENDS_IN_REFERENCE, "<a>&lt", {}, 1, 7},
@@ -245,7 +245,7 @@ TEST(Refusals, HaveDifferentTexts) {
   EXPECT_EQ(texts.size(), REFUSAL_COUNT);
 }
 
-/// The first cells of the table in the part of the page that begins with `heading`.
+/// The first cell of each row of the table in the part of the page that begins with `heading`.
 std::vector<std::string> ReadMessages(const std::string &page, const std::string &heading) {
   std::vector<std::string> messages;
   const std::size_t begin = page.find(heading);
@@ -295,7 +295,7 @@ TEST(Refusals, ReportTheFirstAttributeWithTheNamespaceAndLocalNameOfAnother) {
 }
 
 TEST(Refusals, DoNotConcernWhatOnlyLooksWrong) {
-  // Different namespaces, unbound prefixes, and a default namespace, which attributes do not have.
+  // Different namespaces, unbound prefixes, and a default namespace, which does not apply to attributes.
   const std::string many = Numbered(" x", 20, "=''");
   for (const std::string &more : {""s, many}) {
     EXPECT_NO_THROW(ParseDocument("<a xmlns:p='u' xmlns:q='U' p:x='' q:x=''" + more + "/>"));

@@ -244,7 +244,7 @@ TEST(ParseDocument, RefusesEveryPrefixOfAToken) {
   }
 }
 
-TEST(ParseDocument, ParsesOrThrowsItsExceptionForEveryChangedByteOfAToken) {
+TEST(ParseDocument, ParsesOrThrowsXMLParseExceptionForEveryChangedByteOfAToken) {
   std::string token = ReadDataFile("tokens/bearer.xml");
   ASSERT_FALSE(token.empty());
   std::size_t refused = 0;

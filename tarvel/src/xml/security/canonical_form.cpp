@@ -334,7 +334,8 @@ void CanonicalWalk::WriteProcessingInstruction(const ProcessingInstructionNode &
   WriteOutsideDocumentElement(instruction, false);
 }
 
-// Outside the document element, line feeds separate the nodes: after each node before it, and before each node after it.
+// Outside the document element, line feeds separate the nodes: one follows each node before the element, and one
+// precedes each node after it.
 void CanonicalWalk::WriteOutsideDocumentElement(const Node &node, bool before) {
   const Node *parent = node.GetParent();
   if (parent && parent->GetKind() == NodeKind::DOCUMENT && before == m_documentElementWritten) {

@@ -28,8 +28,9 @@ void SetInclusivePrefixes(CanonicalMethod &method, std::vector<std::string> pref
 
 /// Writes the canonical form of the subtree at `apex`, without the subtree at `omitted` (may be null). No recursion; the
 /// cost is linear in the size of the subtree and of what is written.
-/// @throws XmlSecurityException when the tree has no canonical form: an unbound prefix, a relative or undeclaring
-///         namespace name, an attribute that occurs twice; or when it exceeds the limits in the source files.
+/// @throws XmlSecurityException when the tree has no canonical form: an unbound prefix, a prefix bound to the empty
+///         name, a relative namespace name, a forbidden binding of "xml" or "xmlns", an attribute that occurs twice; or
+///         when the tree exceeds the limits in the source files.
 void WriteCanonicalForm(const Node &apex, const CanonicalMethod &method, const Node *omitted, Writer &writer);
 
 } // namespace Tarvel::Xml::Security

@@ -14,7 +14,7 @@ namespace Tarvel::Xml::Security {
 namespace {
 
 // Escaping makes a document longer, and exclusive canonicalisation repeats a namespace declaration on each element that
-// needs it. Anything larger is a denial-of-service attempt.
+// needs it. A form longer than this limit is a denial-of-service attempt.
 constexpr std::size_t MAX_CANONICAL_BYTES = 8 * MAX_DOCUMENT_BYTES;
 
 template <EscapeSet SET>

@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// The position of an element, for the end of a message.
+/// The position of an element, in the form that ends a message.
 
 #pragma once
 

@@ -104,8 +104,8 @@ private:
   }
 
   const CertificateList m_trusted;
-  // The Base64 form of each trusted certificate, which is unique, so that comparing texts compares bytes; empty if
-  // there are fewer than two certificates.
+  // The Base64 form of each trusted certificate; empty if there are fewer than two certificates. Different bytes have
+  // different forms, and equal bytes the same, so comparing texts is enough.
   std::vector<std::string> m_base64;
   std::size_t m_longestBase64 = 0;
 };

@@ -13,8 +13,8 @@
 
 namespace Tarvel::Xml::Security {
 
-/// A stack of prefix bindings with constant-time look-up. The default namespace has the empty prefix; it is bound to the
-/// empty name, and "xml" to its fixed name, before anything is declared. The caller owns the texts. For one thread.
+/// A stack of prefix bindings with constant-time look-up. The empty prefix means the default namespace. Before anything
+/// is declared, it is bound to the empty name, and "xml" to its fixed name. The caller owns the texts. For one thread.
 class NamespaceBindings {
 public:
   struct Binding {
@@ -45,8 +45,8 @@ public:
   const Binding &operator[](std::size_t index) const noexcept { return m_bindings[index]; }
   std::size_t Size() const noexcept { return m_bindings.size(); }
 
-  /// Makes the output bind the prefix as the source does. @return whether a declaration must be written, because the output
-  /// did not bind it so before.
+  /// Makes the output bind the prefix in the same way as the source. @return whether a declaration must be written for
+  /// this, because the output bound the prefix differently or not at all.
   bool Write(std::size_t index) {
     const Binding &binding = m_bindings[index];
     // If nothing was declared since, both are views of the same text.
@@ -80,7 +80,7 @@ private:
   bool WriteAnew(std::size_t index);
   void Undo(Mark mark) noexcept;
 
-  std::size_t m_recent = NOT_BOUND; // the last one found, while it is in scope: it is usually the next one searched for
+  std::size_t m_recent = NOT_BOUND; // the binding found last, while it is in scope; the next search is usually for it
   std::array<std::uint32_t, BUCKETS> m_buckets;
   boost::container::small_vector<Binding, EXPECTED> m_bindings;
   boost::container::small_vector<Change, EXPECTED> m_changes;

@@ -24,8 +24,8 @@ struct IdentifierSearch {
 std::vector<IdentifierSearch> PlanSearches(const std::vector<std::string_view> &uris);
 
 /// The targets of `uris`, in their order, in the tree that contains `root`: "" is the document (or topmost element), "#x"
-/// the one element with an identifier x in an attribute ID, Id, wsu:Id or xml:id. So an identifier of `root` itself cannot
-/// refer to another element. The tree is walked once for all of them.
+/// the one element with an identifier x in an attribute ID, Id, wsu:Id or xml:id. So the identifier of `root` cannot
+/// refer to another element. The tree is walked once for all references.
 /// @throws XmlSecurityException when a URI is neither "" nor "#x", or not exactly one element has the identifier.
 std::vector<const Node *> ResolveReferences(const ElementNode &root, const std::vector<std::string_view> &uris);
 

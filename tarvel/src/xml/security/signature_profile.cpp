@@ -118,8 +118,8 @@ DigestAlgorithm RequireDigestAlgorithm(const AlgorithmSyntax &syntax) {
   return *algorithm;
 }
 
-/// Accepts the enveloped-signature transform, then one canonicalisation, each at most once: a transform after that would have
-/// to parse octets again.
+/// Accepts the enveloped-signature transform, then one canonicalisation, each at most once: a transform after the
+/// canonicalisation would have to parse octets again.
 void PlanTransforms(const std::vector<AlgorithmSyntax> &transforms, ReferencePlan &plan) {
   if (transforms.size() > MAX_TRANSFORMS) {
     throw XmlSecurityException("A reference has " + std::to_string(transforms.size()) + " transforms; at most " +

@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// The algorithms and forms of signatures that are accepted; everything else is refused by name.
+/// The algorithms and forms of signatures that are accepted. Everything else is refused, and the message names it.
 
 #pragma once
 

@@ -128,7 +128,7 @@ AlgorithmSyntax ReadAlgorithm(const ElementNode &element) {
   algorithm.uri = RequireAttribute(element, "Algorithm");
   for (ChildElements children(element); children.Current(); children.MoveOn()) {
     const ElementNode &child = *children.Current();
-    // The namespace of the parameter is the algorithm's URI.
+    // The URI of exclusive canonicalisation is also the namespace of its parameter.
     if (!algorithm.prefixList && child.HasQName(CanonicalizationUri::EXCLUSIVE, "InclusiveNamespaces")) {
       algorithm.prefixList = ReadPrefixList(child);
     } else if (algorithm.otherParameter.empty()) {

@@ -100,8 +100,8 @@ bool ParsedSignature::IsGenuine(const KeyInfoResolver &resolver) const {
   for (std::size_t index = 0; index < targets.size(); ++index) {
     RequireTargetContainsSignature(*targets[index], plan.references[index], m_syntax.references[index]);
   }
-  // The digests may cost as much as hashing the document ten times. Since the signature comes first, only a signer can
-  // cause that work.
+  // The digests may cost as much as hashing the document ten times. The signature is checked first, so that only a
+  // signer can cause that work.
   if (!SignatureMatches(plan, keys)) {
     return false;
   }
