@@ -15,7 +15,7 @@ std::set<std::string> OptionsBehind(const std::string &start, const std::string 
 /// The options that begin an indented line of a command's help.
 std::set<std::string> OptionsOfHelp(const std::string &command);
 
-/// Those of them that take an argument.
+/// The options in a command's help that take an argument.
 std::set<std::string> OptionsWithArgument(const std::string &command);
 
 } // namespace ToolTest
