@@ -21,7 +21,7 @@
 
 namespace DevStsTest {
 
-/// The identity with that name in the service's state folder, such as "client".
+/// The identity `name` in the service's state folder, such as "client".
 SsoClient::HolderOfKeyConfig IdentityOf(const Testing::DevSts &service, const std::string &name);
 
 /// A builder that signs with that identity, or does not sign when the name is empty.

@@ -63,7 +63,7 @@ TEST_F(AcquireByTicket, BindsTheTokenToAKeyWhenThereIsOne) {
   EXPECT_THAT(result.out, HasSubstr("\nConfirmation:    holder-of-key\n"));
 }
 
-TEST_F(AcquireByTicket, GivesABearerTokenWhenOneIsAskedForDespiteAKey) {
+TEST_F(AcquireByTicket, GivesABearerTokenDespiteAKeyIfAskedTo) {
   LogIn();
   const Result result = AcquireWith(std::string(IDENTITY) + "--bearer");
   ExpectTokenOf("alice@corp.example", result);
@@ -203,7 +203,7 @@ TEST_F(AcquireByTicket, IsRefusedForAUserThatTheServiceDoesNotKnow) {
                "ssoclient: credentials refused: Authentication failed: unknown user mallory@CORP.EXAMPLE\n");
 }
 
-TEST_F(AcquireByTicket, RefusesANameThatIsNotAServiceAsAWrongCommandLine) {
+TEST_F(AcquireByTicket, ReportsAServiceNameThatIsNotValidAsAWrongCommandLine) {
   LogIn();
   ExpectResult(
       AcquireWith("--service HTTP"), 2, "",

@@ -86,7 +86,7 @@ TEST(AsFuture, PassesTheArgumentsOfEachOperationOn) {
                                                          "4: Renew 4", "5: ValidateSubject"}));
 }
 
-TEST(AsFuture, TakesAHandlerOfTheCallersOwnClass) {
+TEST(AsFuture, AcceptsAHandlerOfTheCallersOwnClass) {
   const auto service = ServiceThatAnswers("leg:context||" + Testing::ReadDataFile("tokens/bearer.xml"));
   const std::vector<std::shared_ptr<Testing::Bytes>> script{Testing::Leg("hello")};
   const auto handler = std::make_shared<Testing::NegotiationHandlerStandIn>(script);

@@ -323,7 +323,7 @@ TEST_F(CreateSamlTokenTest, VerifiesBeforeItReadsTheFacts) {
   EXPECT_THROWS_MESSAGE(CreateSamlToken(tampered, Trusted()), InvalidSignatureException, TAMPERED);
 }
 
-/// Expects that a prefix of a token is refused. The class of the exception depends on where the prefix ends.
+/// Expects a refusal with one of the documented classes. Which one it is depends on where the text ends.
 void ExpectRefused(const std::string &xml, const CertificateList &trusted) {
   try {
     CreateSamlToken(xml, trusted);

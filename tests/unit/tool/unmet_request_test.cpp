@@ -23,7 +23,7 @@ TokenSpec SpecFor(std::int64_t lifetimeSec) {
   return spec;
 }
 
-/// A token that is valid for an hour from the moment when it was asked for.
+/// A token that is, by default, valid for an hour from the moment when it was asked for.
 TokenFacts HourFrom(const char *start = "2026-01-01T12:00:00Z", const char *end = "2026-01-01T13:00:00Z") {
   TokenFacts facts;
   facts.startDate = DateTime(start);
