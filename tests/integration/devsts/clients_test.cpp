@@ -11,7 +11,7 @@
 namespace DevStsTest {
 namespace {
 
-/// A client that sends each of its requests on one connection.
+/// A client that sends all of its requests on one connection.
 class SteadyClient {
 public:
   explicit SteadyClient(const Testing::DevSts &service)

@@ -1,5 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
-// The faults, as a client sees them that reads plain bytes.
+// The service's faults, seen by a client that reads plain bytes.
 
 #include "messages.h"
 
@@ -148,7 +148,7 @@ TEST_F(Faults, AnswersThatAreSlow) {
   }
 }
 
-TEST_F(Faults, RefusalsPrecedeThem) {
+TEST_F(Faults, DoNotReplaceRefusals) {
   const SsoClient::Request wrong = PasswordRequest("alice@corp.example", "wrong");
   EXPECT_TRUE(IsRefused(Send(m_service, wrong, "/sts/fault/expired-token"), "wst:FailedAuthentication",
                         "unknown user or wrong password"));
@@ -156,7 +156,7 @@ TEST_F(Faults, RefusalsPrecedeThem) {
                         "unknown user or wrong password"));
 }
 
-TEST_F(Faults, OnceIsOnlyForTheFirstRequest) {
+TEST_F(Faults, WithOnceAffectOnlyTheFirstRequest) {
   EXPECT_EQ(Meet("bad-status/once/a").status, 503);
   EXPECT_TRUE(IsIssued(Meet("bad-status/once/a")));
   EXPECT_EQ(Meet("bad-status/once/b").status, 503);

@@ -54,7 +54,7 @@ TEST_F(Http, OtherMethodsPathsAndMediaTypes) {
   EXPECT_EQ(StatusOf(PostBytes(request.soapAction, request.body, "/sts", "Text/XML; charset=utf-8")), 200);
 }
 
-TEST(HttpInAnotherCharset, RequestsAndAnswersAreInIt) {
+TEST(HttpInAnotherCharset, AppliesToRequestsAndAnswers) {
   const Testing::WorkFolder folder;
   const Testing::DevSts service(
       {"--charset", "iso-8859-1", "--users",
@@ -74,7 +74,7 @@ TEST(HttpInAnotherCharset, RequestsAndAnswersAreInIt) {
   EXPECT_FALSE(IsIssued(sendPassword("zo\xC3\xAB", "\xC3\xBC")));
 }
 
-TEST(HttpInAnotherCharset, ARequestInADifferentCharsetIsRefused) {
+TEST(HttpInAnotherCharset, RefusesARequestInADifferentCharset) {
   const Testing::DevSts service({"--charset", "windows-1252"});
   SsoClient::Request request = PasswordRequest();
   request.body = Replaced(request.body, "wonderland", "\x81"); // which windows-1252 does not have

@@ -1,5 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
-// The library's own client against the development service: the token says what was asked for.
+// The library's client with the development service: the token has what was asked for.
 
 #include "messages.h"
 
@@ -118,7 +118,7 @@ TEST_F(IssuedTokens, AreValidForAsLongAsAskedFor) {
   EXPECT_EQ(LifetimeOf(ByPassword(spec)), 4321);
 }
 
-TEST_F(IssuedTokens, CarryWhatTheSpecAsksFor) {
+TEST_F(IssuedTokens, HaveWhatTheSpecAsksFor) {
   TokenSpec spec = RenewableSpec();
   spec.audienceRestriction = {"https://files.example/", "https://mail.example/"};
   spec.advice = {{"urn:mapper", {{"colour", {"red <&> green", "blue"}}, {"none", {}}}}, {"urn:audit", {}}};

@@ -21,7 +21,7 @@
 
 namespace DevStsTest {
 
-/// The identity with that name in the service's state folder, such as "client".
+/// The identity `name` in the service's state folder, such as "client".
 SsoClient::HolderOfKeyConfig IdentityOf(const Testing::DevSts &service, const std::string &name);
 
 /// A builder that signs with that identity, or does not sign when the name is empty.
@@ -37,7 +37,7 @@ SsoClient::Request PasswordRequest(const std::string &user = "alice@corp.example
 SsoClient::Request CertificateRequest(const Testing::DevSts &service, const SsoClient::TokenSpec &spec = PlainSpec(),
                                       const std::string &identity = "client");
 
-/// `text` with the first `from` replaced. @throws std::runtime_error when there is none: a test that corrupts nothing
+/// `text` with the first `from` replaced. @throws std::runtime_error when there is none to corrupt
 std::string Replaced(std::string text, std::string_view from, std::string_view to);
 /// `text` without the part from the first `begin` to the next `end`, both included.
 std::string Without(const std::string &text, std::string_view begin, std::string_view end);
@@ -49,7 +49,7 @@ HttpAnswer Send(const Testing::DevSts &service, const SsoClient::Request &reques
 /// The assertion in an answer, in a form that the builder accepts. @throws std::runtime_error when there is none
 Testing::TokenStandIn TokenIn(const HttpAnswer &answer);
 
-/// While it lives, the library's clock is that much ahead of the true time.
+/// While it exists, the library's clock is this much ahead of the true time.
 class ShiftedClock {
 public:
   explicit ShiftedClock(std::chrono::seconds ahead);

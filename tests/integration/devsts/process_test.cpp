@@ -210,7 +210,7 @@ TEST(UsersFile, IsRefusedWhenItHasAnotherForm) {
   };
   const std::string begin = "development service: ended with 1: ssoclient-devsts: " + (folder / "users.json") + ": ";
   EXPECT_EQ(refusal("not JSON"), begin + "not JSON at byte 2\n");
-  EXPECT_EQ(refusal(R"([{"name":"c@d","password":"secret" x)"), begin + "not JSON at byte 36\n"); // and no password
+  EXPECT_EQ(refusal(R"([{"name":"c@d","password":"secret" x)"), begin + "not JSON at byte 36\n"); // no password
   EXPECT_EQ(refusal("{}"), begin + "not an array of users\n");
   EXPECT_THAT(refusal(R"([{"name":"carol@other.example"}])"), HasSubstr("key 'password' not found"));
   EXPECT_EQ(refusal(R"([{"name":"carol","password":""}])"), begin + "'carol' is not of the form name@domain\n");

@@ -10,7 +10,7 @@ namespace {
 
 using std::chrono::seconds;
 
-/// How far clocks may differ by the service's default.
+/// The service's default for how far clocks may differ.
 constexpr seconds TOLERANCE(60);
 /// How long the library's messages are valid.
 constexpr seconds MESSAGE_LIFE(600);

@@ -37,7 +37,7 @@ TEST_F(RefusedSignatures, AcceptsTheSameMessageUnchanged) {
   EXPECT_TRUE(IsIssued(Send(m_service, m_request)));
 }
 
-/// What a token says about its subject and about delegation.
+/// A token's subject, and whether it may be delegated.
 std::string SaidIn(const HttpAnswer &answer) {
   return Between(answer.body, "<saml:Subject>", "</saml:Subject>") +
          Between(answer.body, "<saml:ProxyRestriction ", ">");
@@ -60,7 +60,7 @@ TEST_F(RefusedSignatures, MessageWithOneBitChangedIsRefusedOrGetsWhatWasSigned) 
     ASSERT_TRUE(IsIssued(answer)) << at;
     EXPECT_EQ(SaidIn(answer), signedSaying) << at;
   }
-  // The rest are a few names without meaning, such as a prefix that changes in both its declaration and its use.
+  // The rest change text without meaning, such as the declaration of `wst` at the body, which its content repeats.
   EXPECT_GT(refusals, m_request.body.size() / STEP * 95 / 100);
 }
 
@@ -100,7 +100,7 @@ TEST_F(RefusedSignatures, BodySwappedForThatOfAnotherSignedMessage) {
 }
 
 // The signed body is still in the message, and still verifies, but it is not the body that the service reads.
-TEST_F(RefusedSignatures, SignedBodyMovedAsideForAnotherBody) {
+TEST_F(RefusedSignatures, SignedBodyReplacedAndKeptElsewhere) {
   const std::string signedBody = "<soapenv:Body " + Between(m_request.body, "<soapenv:Body ", "</soapenv:Body>");
   const std::string content = Between(m_request.body, "<wst:RequestSecurityToken ", "</wst:RequestSecurityToken>");
   const std::string forged = "<soapenv:Body><wst:RequestSecurityToken " +
@@ -120,7 +120,7 @@ TEST_F(RefusedSignatures, TimestampChangedAfterSigning) {
   EXPECT_TRUE(IsRefused(SendCorrupted(expires, later), "wsse:FailedCheck", WRONG_SIGNATURE));
 }
 
-TEST_F(RefusedSignatures, SignedTimestampMovedAsideForAnotherTimestamp) {
+TEST_F(RefusedSignatures, SignedTimestampReplacedAndKeptElsewhere) {
   const std::string timestamp =
       "<wsu:Timestamp " + Between(m_request.body, "<wsu:Timestamp ", "</wsu:Timestamp>") + "</wsu:Timestamp>";
   const std::string created =

@@ -89,7 +89,7 @@ TEST_F(RefusedTokens, ExchangeOfABearerTokenWhichHasNoKey) {
 TEST_F(RefusedTokens, ExchangeWithoutSignature) {
   SsoClient::Request request;
   BuilderFor(m_service, "client").BuildExchangeTokenRequest(Acquire(), PlainSpec(), request);
-  // The message's signature is the last one; the token's own stays.
+  // The message's signature is the last one; the token keeps its own.
   const std::size_t at = request.body.rfind("<ds:Signature ");
   request.body = request.body.substr(0, at) + Without(request.body.substr(at), "<ds:Signature ", "</ds:Signature>");
   EXPECT_TRUE(IsRefused(Send(m_service, request), "wsse:InvalidSecurity",
@@ -169,7 +169,7 @@ TEST_F(RefusedTokens, EleventhRenewal) {
   EXPECT_TRUE(IsRefused(Renew(token), "wst:UnableToRenew", "the token is not renewable"));
 }
 
-TEST_F(RefusedTokens, ValidationReportsEachOfThemAsInvalid) {
+TEST_F(RefusedTokens, ValidationReportsEachWrongTokenAsInvalid) {
   EXPECT_EQ(Validate(Acquire("expired-token")), INVALID);
   EXPECT_EQ(Validate(Acquire("early-token")), INVALID);
   EXPECT_EQ(Validate(Acquire("wrong-signer")), INVALID);

@@ -99,7 +99,7 @@ bool RawConnection::IsEnded() {
 TlsClient::TlsClient(const Testing::DevSts &service, bool v6)
     : m_context(NewContext(service), SSL_CTX_free), m_connection(service, v6),
       m_tls(SSL_new(m_context.get()), SSL_free) {
-  std::signal(SIGPIPE, SIG_IGN); // OpenSSL writes to a connection that the service has reset without asking for silence
+  std::signal(SIGPIPE, SIG_IGN); // OpenSSL may write to a connection that the service has reset
   ERR_clear_error();
   Require(SSL_set_fd(m_tls.get(), m_connection.GetDescriptor()) == 1 && SSL_set1_host(m_tls.get(), "localhost") == 1 &&
               SSL_connect(m_tls.get()) == 1,

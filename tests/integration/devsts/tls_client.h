@@ -16,7 +16,7 @@ struct ssl_ctx_st;
 namespace DevStsTest {
 
 struct HttpAnswer {
-  int status = 0; ///< 0 when there was no answer
+  int status = 0; ///< 0 without a complete header
   std::string head;
   std::string body;
 };
@@ -31,7 +31,8 @@ public:
 
   void Send(std::string_view bytes);
 
-  /// Waits until the service ends the connection, and drops what it sends before. Returns whether it did end.
+  /// Waits until the service ends the connection, and discards what it sends before. Returns false after half a minute
+  /// of silence.
   bool IsEnded();
 
   int GetDescriptor() const noexcept { return m_descriptor; }
@@ -40,7 +41,7 @@ private:
   int m_descriptor;
 };
 
-/// One connection to the service, which must show the certificate that its authority gave it.
+/// One connection to the service, which must present a certificate of its authority.
 class TlsClient {
 public:
   explicit TlsClient(const Testing::DevSts &service, bool v6 = false);
@@ -52,7 +53,7 @@ public:
   /// The next answer. Its body is as long as the Content-Length, or shorter when the service has ended the connection.
   HttpAnswer Receive();
 
-  /// Whether the service has ended the connection. Waits for it to send something or to end.
+  /// Whether the service has ended the connection. Waits until it does so or sends something.
   bool IsClosed();
 
 private:
@@ -64,7 +65,7 @@ private:
   std::string m_ahead;
 };
 
-/// A SOAP request over HTTP, as bytes. An empty content type leaves the header out.
+/// The bytes of a SOAP request over HTTP. With an empty content type, the header Content-Type is missing.
 std::string PostBytes(std::string_view action, std::string_view message, std::string_view target = "/sts",
                       std::string_view contentType = "text/xml");
 

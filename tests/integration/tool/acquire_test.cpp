@@ -1,5 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
-// What acquire prints, asserted whole, for every kind of answer of the service.
+// What acquire prints for every kind of answer of the service.
 
 #include "expect_result.h"
 #include "service_test.h"
@@ -64,7 +64,7 @@ TEST_F(Acquire, AsksForEightHoursWithoutALifetime) {
             SecondsOf(AttributeIn(conditions, "NotOnOrAfter")) - SecondsOf(AttributeIn(conditions, "NotBefore")));
 }
 
-TEST_F(Acquire, ByIdentityAloneBindsTheTokenToTheKey) {
+TEST_F(Acquire, ByIdentityWithoutPasswordBindsTheTokenToTheKey) {
   const Result result = Run("ssoclient acquire " + Service() + IDENTITY + "--format json --out token.xml");
   const Result thumbprint = Run("openssl x509 -in client.pem -noout -fingerprint -sha256 | sed 's/.*=//;s/://g' | "
                                 "tr -d '\\n' | tr A-F a-f");
@@ -222,14 +222,14 @@ const Answer ANSWERS[] = {
      "The TLS connection to localhost broke: The connection to localhost:@PORT@ broke: Connection reset by peer"},
     {"StatusOfFailure", "bad-status", PASSWORD, 4, "CommunicationException", "communication failed",
      "Server returned error: 503 Service Unavailable"},
-    {"AnswerThatIsNoHttp", "garbage", PASSWORD, 4, "CommunicationException", "communication failed",
+    {"AnswerThatIsNotHttp", "garbage", PASSWORD, 4, "CommunicationException", "communication failed",
      "Bad response from localhost:@PORT@: its header is not HTTP/1.x (bad version)"},
     {"TamperedToken", "tampered-token", PASSWORD, 6, "InvalidSignatureException", "signature invalid",
      "Failed to verify signature: token might have been tampered with."},
     {"ForeignToken", "wrong-signer", PASSWORD, 6, "InvalidSignatureException", "signature invalid",
      "Failed to verify signature: token might have been tampered with."},
     {"AnswerWithoutToken", "no-token", PASSWORD, 8, "SsoException", "service fault", "Unexpected XML format"},
-    {"AnswerThatIsNoSoap", "not-soap", PASSWORD, 8, "SsoException", "service fault",
+    {"AnswerThatIsNotSoap", "not-soap", PASSWORD, 8, "SsoException", "service fault",
      "Unexpected response format: missing SAOP Body."},
     {"UnknownFault", "soap-fault-Unknown", PASSWORD, 8, "SsoException", "service fault",
      "Unexpected SOAP fault: devsts:Unknown; request failed."},

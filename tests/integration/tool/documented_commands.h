@@ -11,10 +11,11 @@
 
 namespace ToolTest {
 
-/// Each with its continuation lines.
+/// The examples in the help of `command`, each with its continuation lines.
 std::vector<std::string> ExamplesOfHelp(const std::string &command);
+/// Those in the manual.
 std::vector<std::string> ExamplesOfManual();
-/// Of a Markdown page such as "README.md": the lines of the shell blocks that begin with the tool.
+/// Those of a Markdown page such as "README.md": the lines of its shell blocks that begin with the name of the tool.
 std::vector<std::string> ExamplesOfPage(const std::string &page);
 
 /// Whether an example needs a Kerberos realm.
@@ -24,7 +25,8 @@ class DocumentedCommands : public ServiceTest {
 protected:
   explicit DocumentedCommands(const std::vector<std::string> &serviceArguments = {});
 
-  /// Runs one example with the running service in place of the example's. Types the password when it is prompted for.
+  /// Expects one example to succeed, with the running service in place of the example's. Types the password when it is
+  /// prompted for.
   void ExpectToRun(const std::string &example) const;
 };
 

@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
-// An option with an empty argument, which a shell makes of a variable that is not set, does not count as an option that
-// is not given.
+// An empty argument, which a shell makes of a variable that is not set, is refused: the tool does not treat it like an
+// option that is not given.
 
 #include "expect_result.h"
 #include "help_options.h"

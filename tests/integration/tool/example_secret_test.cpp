@@ -32,7 +32,7 @@ TEST(ExampleAcquire, LeavesNoCopyOfThePasswordInMemory) {
   const Result forPassword = search(LONG_PASSWORD);
   EXPECT_EQ(forPassword.exitCode, 0) << forPassword.err;
   EXPECT_THAT(forPassword.err, testing::MatchesRegex("acquired _.*\nfound 0 times\n"));
-  // The search does find what is there.
+  // The search finds a text that is in memory.
   EXPECT_THAT(search("alice@corp.example").err, testing::MatchesRegex("acquired _.*\nfound [1-9][0-9]* times\n"));
 }
 

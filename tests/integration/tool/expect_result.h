@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// How a run of the tool must have ended, asserted whole.
+/// Asserts the exit code and the whole output of a run of the tool.
 
 #pragma once
 

@@ -1,5 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
-// Runs, in a Kerberos realm, each command line in the help, the manual and the pages that needs one.
+// Runs each command line in the help, the manual and the pages that needs a Kerberos realm.
 
 #include "documented_commands.h"
 #include "ticket_world.h"
@@ -28,7 +28,7 @@ protected:
 
   ~DocumentedForTickets() override { unsetenv("KERBEROS_FOLDER"); }
 
-  /// @return the number of these examples
+  /// Runs the examples that need a realm. @return their number
   int RunThose(const std::vector<std::string> &examples) const {
     int count = 0;
     for (const std::string &example : examples) {

@@ -34,8 +34,8 @@ protected:
     EXPECT_THAT(result.out, HasSubstr("\nSubject:         " + subject + "\n"));
   }
 
-  /// Expects a failure in one line, and no token. The line begins with our text, and goes on with the Kerberos
-  /// library's, which differs from version to version.
+  /// Expects a failure in one line, and no token. The line begins with the text of the tool, `ours`. The text of the
+  /// Kerberos library follows, which differs from version to version and must contain `words`.
   void ExpectFailure(int exitCode, const std::string &ours, const std::string &words, const Result &result) const {
     EXPECT_EQ(exitCode, result.exitCode);
     EXPECT_EQ("", result.out);
@@ -63,7 +63,7 @@ TEST_F(AcquireByTicket, BindsTheTokenToAKeyWhenThereIsOne) {
   EXPECT_THAT(result.out, HasSubstr("\nConfirmation:    holder-of-key\n"));
 }
 
-TEST_F(AcquireByTicket, GivesABearerTokenWhenOneIsAskedForDespiteAKey) {
+TEST_F(AcquireByTicket, GivesABearerTokenDespiteAKeyIfAskedTo) {
   LogIn();
   const Result result = AcquireWith(std::string(IDENTITY) + "--bearer");
   ExpectTokenOf("alice@corp.example", result);
@@ -203,7 +203,7 @@ TEST_F(AcquireByTicket, IsRefusedForAUserThatTheServiceDoesNotKnow) {
                "ssoclient: credentials refused: Authentication failed: unknown user mallory@CORP.EXAMPLE\n");
 }
 
-TEST_F(AcquireByTicket, RefusesANameThatIsNotAServiceAsAWrongCommandLine) {
+TEST_F(AcquireByTicket, ReportsAServiceNameThatIsNotValidAsAWrongCommandLine) {
   LogIn();
   ExpectResult(
       AcquireWith("--service HTTP"), 2, "",
@@ -230,7 +230,7 @@ protected:
       : AcquireByTicket({.name = "CORP.EXAMPLE", .clockOffsetSec = -1000, .adoptsClock = true}) {}
 };
 
-TEST_F(AcquireInARealmWithAWrongClock, IsRefusedForTheClock) {
+TEST_F(AcquireInARealmWithAWrongClock, IsRefusedBecauseOfTheClock) {
   LogIn();
   ExpectFailure(3, "credentials refused: Authentication failed: Unspecified GSS failure.", "Clock skew too great",
                 AcquireWith(""));

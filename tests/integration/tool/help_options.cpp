@@ -40,7 +40,7 @@ std::set<std::string> OptionsWithArgument(const std::string &command) {
   const std::string help = RunTool({command, "--help"}).out;
   std::set<std::string> options;
   for (const std::string &option : OptionsOfHelp(command)) {
-    // The argument's name follows in capitals; the help of a flag begins later, in its column.
+    // The name of an argument follows at once, in capitals. A flag has only its description, in a later column.
     const std::size_t end = help.find(option + " ") + option.size();
     if (help[end + 1] >= 'A' && help[end + 1] <= 'Z') {
       options.insert(option);

@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// The options that a text lists, such as the help of a command.
+/// The options in a text such as the help of a command.
 
 #pragma once
 
@@ -9,13 +9,13 @@
 
 namespace ToolTest {
 
-/// The long options that the text has right after `start`, also those after a short option and `separator`.
+/// The long options directly after each `start` in `text`, with or without a short option and `separator` in between.
 std::set<std::string> OptionsBehind(const std::string &start, const std::string &text, const std::string &separator);
 
 /// The options that begin an indented line of a command's help.
 std::set<std::string> OptionsOfHelp(const std::string &command);
 
-/// Those of them that take an argument.
+/// The options in a command's help that take an argument.
 std::set<std::string> OptionsWithArgument(const std::string &command);
 
 } // namespace ToolTest

@@ -11,12 +11,12 @@ namespace {
 
 constexpr const char *LINE = "ssoclient acquire --sts https://127.0.0.1:9/sts --trust sts-rsa.crt --gss ";
 
-TEST(ToolWithoutGssapi, SaysSoInOneLine) {
+TEST(ToolWithoutGssapi, RefusesTheOptionInOneLine) {
   ExpectResult(RunShell(LINE), 2, "",
                "ssoclient: usage: --gss is not available: this ssoclient is built without the GSSAPI\n");
 }
 
-TEST(ToolWithoutGssapi, SaysSoInJson) {
+TEST(ToolWithoutGssapi, RefusesTheOptionInJson) {
   ExpectResult(RunShell(std::string(LINE) + "--format json"), 2, "",
                R"({"schema":1,"error":{"class":"UsageException","message":"--gss is not available: this ssoclient is )"
                "built without the GSSAPI\"}}\n");

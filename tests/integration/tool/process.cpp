@@ -180,7 +180,7 @@ Result RunToolAndSignal(const std::vector<std::string> &arguments, int signal) {
   Process process;
   Result result;
   Start(process, ToolCommand(arguments), Testing::DataPath("tokens"));
-  // No event reports to another process that this one now catches a signal, so this asks for its state again and again.
+  // No event reports that a process has begun to catch a signal, so this reads the state of the process repeatedly.
   while (!Catches(process.id, signal)) {
     if (waitpid(process.id, nullptr, WNOHANG) != 0) {
       throw std::runtime_error("the tool ended before it caught the signal");

@@ -17,9 +17,8 @@ struct Result {
   std::string err;
 };
 
-/// To be called in a new process before it executes another program: resets signals to what they do in a shell's
-/// foreground. The parent of the tests may ignore some, as a shell does for background jobs, and a program inherits
-/// that.
+/// Resets signals to what they do in a shell's foreground. Called in a new process before it executes another program,
+/// since a program inherits which signals its parent ignores: a shell ignores some for background jobs.
 void HeedSignals();
 
 /// The words that start the tool with `arguments`.
@@ -31,7 +30,7 @@ std::vector<std::string> ShellCommand(const std::string &commandLine);
 /// Runs the tool with `arguments`, in tests/data/tokens, with `input` as its standard input, to its end.
 Result RunTool(const std::vector<std::string> &arguments, const std::string &input = {});
 
-/// Runs `commandLine` by the shell, in `folder`, as `ShellCommand` says.
+/// Runs `ShellCommand(commandLine)` in `folder`.
 Result RunShell(const std::string &commandLine, const std::string &folder = Testing::DataPath("tokens"));
 
 /// Starts the tool with a standard input that stays open and silent, sends it `signal` as soon as it catches that

@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 // How the tool reads passwords and passphrases, seen from outside. No service listens at the address, so a run that has
-// read its secrets ends with 4.
+// read its secrets ends with exit code 4.
 
 #include "closed_port.h"
 #include "expect_result.h"
@@ -36,7 +36,7 @@ protected:
     return ToolCommand(all);
   }
 
-  /// A command line that a shell runs in the folder with the keys.
+  /// The same command with `more` as a command line for a shell.
   std::string ShellLine(const std::string &more) const {
     std::string line = "ssoclient";
     for (const std::string &word : m_acquire) {

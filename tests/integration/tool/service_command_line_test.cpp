@@ -25,7 +25,7 @@ struct Refusal {
   int exitCode;
   const char *exceptionClass;
   const char *label;
-  const char *message; ///< as in text; of the characters that JSON escapes, it contains only double quotes
+  const char *message; ///< in text; the only characters in it that JSON escapes are double quotes
 };
 
 #define STS "--sts https://127.0.0.1:9/sts --trust sts-rsa.crt "
@@ -77,7 +77,7 @@ const Refusal REFUSALS[] = {
      "--verbose: takes no argument" SEE_HELP},
     {"PasswordAsAnArgument", "acquire " STS "--user alice wonderland", USAGE, "too many arguments" SEE_HELP},
     {"PasswordJoinedToAShortOption", "acquire " STS "--user alice -pwonderland", USAGE, "not expected: -p" SEE_HELP},
-    {"PasswordBehindAShortOption", "acquire " STS "--user alice -p wonderland", USAGE, "not expected: -p" SEE_HELP},
+    {"PasswordAfterAShortOption", "acquire " STS "--user alice -p wonderland", USAGE, "not expected: -p" SEE_HELP},
     {"PasswordLikeAnOptionOnTheCommandLine", "acquire " STS "--user alice --password --wonderland", USAGE,
      "not expected: --password" SEE_HELP},
     {"PasswordBeforeTheCommand", "--password=wonderland acquire " STS "--user alice", USAGE,
@@ -88,13 +88,13 @@ const Refusal REFUSALS[] = {
      "not expected: --password" SEE_HELP},
     {"CertificateWithoutKey", "acquire " STS "--cert holder.crt", USAGE, "--cert requires --key" SEE_HELP},
     {"KeyWithoutCertificate", "acquire " STS "--key holder.key", USAGE, "--key requires --cert" SEE_HELP},
-    {"KeyStoreBesideKey", "acquire " STS "--cert holder.crt --key holder.key --p12 x.p12", USAGE,
+    {"KeyStoreAndKey", "acquire " STS "--cert holder.crt --key holder.key --p12 x.p12", USAGE,
      "--cert excludes --p12" SEE_HELP},
     {"PassphraseWithoutKey", "acquire " STS "--user alice --passphrase-fd 3", USAGE,
      "there is no key for the passphrase; give --cert and --key, or --p12"},
     {"ExchangeWithoutIdentity", "acquire " STS "--token bearer.xml", USAGE,
      "--token needs an identity to sign with; give --cert and --key, or --p12"},
-    {"BearerByIdentityAlone", "acquire " STS "--bearer --cert holder.crt --key holder.key", USAGE,
+    {"BearerWithOnlyAnIdentity", "acquire " STS "--bearer --cert holder.crt --key holder.key", USAGE,
      "--bearer cannot be combined with an identity alone, whose token is bound to its key"},
     {"StandardInputTwice", "acquire " STS "--p12 x.p12 --passphrase-file - --user alice --password-file -", USAGE,
      "--password-file and --passphrase-file cannot both read standard input"},
@@ -102,11 +102,11 @@ const Refusal REFUSALS[] = {
      "FILE and --passphrase-fd cannot both read standard input"},
     {"DescriptorTwice", "acquire " STS "--p12 x.p12 --passphrase-fd 3 --user alice --password-fd 3", USAGE,
      "--password-fd and --passphrase-fd cannot both read descriptor 3"},
-    {"LifetimeOfNoNumber", "acquire " STS "--user alice --lifetime soon", USAGE,
+    {"LifetimeThatIsNotANumber", "acquire " STS "--user alice --lifetime soon", USAGE,
      "--lifetime must be a duration such as 8h (units: s, m, h, d)"},
     {"LifetimeOfAnUnknownUnit", "acquire " STS "--user alice --lifetime 8w", USAGE,
      "--lifetime must be a duration such as 8h (units: s, m, h, d)"},
-    {"LifetimeOfAUnitAlone", "acquire " STS "--user alice --lifetime h", USAGE,
+    {"LifetimeOfOnlyAUnit", "acquire " STS "--user alice --lifetime h", USAGE,
      "--lifetime must be a duration such as 8h (units: s, m, h, d)"},
     {"LifetimeOfZero", "acquire " STS "--user alice --lifetime 0h", USAGE, "--lifetime must be positive"},
     {"NegativeLifetime", "renew " STS "--p12 x.p12 --lifetime=-1h token.xml", USAGE, "--lifetime must be positive"},
@@ -133,10 +133,10 @@ const Refusal REFUSALS[] = {
     {"AuthorityForPlainHttp",
      "validate --sts http://127.0.0.1:9/ --allow-http --ca sts-rsa.crt --trust sts-rsa.crt bearer.xml", USAGE,
      "--ca and --thumbprint protect nothing on a plain http address"},
-    {"AuthorityBesideThumbprint", "validate " STS "--ca sts-rsa.crt --thumbprint 00 bearer.xml", USAGE,
+    {"AuthorityAndThumbprint", "validate " STS "--ca sts-rsa.crt --thumbprint 00 bearer.xml", USAGE,
      "--ca excludes --thumbprint" SEE_HELP},
     {"ThumbprintOfAnotherForm", "validate " STS "--thumbprint 00:11 bearer.xml", USAGE, THUMBPRINT_FORM},
-    {"AddressThatIsNone", "validate --sts sts.corp.example --trust sts-rsa.crt bearer.xml", 2, "MalformedURLException",
+    {"InvalidAddress", "validate --sts sts.corp.example --trust sts-rsa.crt bearer.xml", 2, "MalformedURLException",
      "usage", "Malformed URL \"sts.corp.example\": the scheme is not http or https"},
     {"RenewalWithoutIdentity", "renew " STS "holder-of-key.xml", USAGE,
      "renewing needs the key that the token is bound to; give --cert and --key, or --p12"},
@@ -174,7 +174,7 @@ const Refusal REFUSALS[] = {
      "../crypto/certificate-only.p12: The passphrase of the PKCS#12 key store is wrong"},
     {"KeyThatIsNotRsa", "acquire " STS "--cert ../crypto/p256.crt --key ../crypto/p256.key", 7, "CryptoException",
      "key or certificate", "../crypto/p256.key: only an RSA key signs requests, and this is EC"},
-    {"OutputThatIsThere", "acquire " STS "--user alice --out full.xml", 7, "IOException", "file",
+    {"OutputThatExists", "acquire " STS "--user alice --out full.xml", 7, "IOException", "file",
      "full.xml: already exists; --force replaces it"},
     {"OutputThatIsAFolder", "acquire " STS "--user alice --out templates --force", 7, "IOException", "file",
      "templates: is not a regular file"},
@@ -186,7 +186,7 @@ const Refusal REFUSALS[] = {
 
 class ServiceRefusal : public testing::TestWithParam<Refusal> {
 protected:
-  // Without a terminal, so that a run that is not refused as expected does not prompt at the terminal of the tests.
+  // Without a terminal: a run that is accepted by mistake must not prompt at the terminal of the tests.
   static Result Run(const std::string &more) {
     return RunShell(std::string("setsid -w ssoclient ") + GetParam().commandLine + more);
   }
@@ -298,7 +298,7 @@ TEST(Service, ThatCannotBeReachedLeavesNoFile) {
   EXPECT_TRUE(folder.Names().empty());
 }
 
-TEST(Service, KeepsTheFileThatWasThereWhenItCannotBeReached) {
+TEST(Service, ThatCannotBeReachedLeavesAnExistingFileUnchanged) {
   const ClosedPort port;
   const WorkFolder folder;
   folder.Write("token.xml", "what was there");

@@ -50,7 +50,7 @@ protected:
   /// Runs a shell's command line in the folder.
   Result Run(const std::string &commandLine) const { return RunShell(commandLine, m_folder.Path()); }
 
-  /// Has the service issue a token into `file`. @throws std::runtime_error when that fails.
+  /// Runs the tool to acquire a token and write it to `file`. @throws std::runtime_error when that fails.
   void Acquire(const std::string &file, const std::string &options) const {
     const Result result = Run("ssoclient acquire " + Service() + options + " --out " + file);
     if (result.exitCode != 0) {

@@ -104,7 +104,7 @@ void TerminalSession::Signal(int signal) {
 
 int TerminalSession::Finish() {
   int status = 0;
-  // This end keeps the terminal open, so the end of the process does not show there: check for it between reads.
+  // Reads do not show that the process has ended, since `m_slave` keeps the terminal open: check for that between them.
   for (int waited = 0; waitpid(m_process, &status, WNOHANG) == 0; waited += TURN_MS) {
     if (waited > PATIENCE_MS) {
       throw std::runtime_error("the process does not end; the terminal shows '" + m_shown + "'");

@@ -21,7 +21,7 @@ public:
   TerminalSession &operator=(const TerminalSession &) = delete;
   ~TerminalSession();
 
-  /// Reads on until the terminal shows `text`.
+  /// Reads until the terminal shows `text`.
   void WaitFor(const std::string &text);
   void Type(const std::string &text);
   /// Whether the terminal echoes what is typed.

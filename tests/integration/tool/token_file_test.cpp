@@ -1,5 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
-// The file that a token is written to: whole or not at all, and only for its owner.
+// The file that a token is written to: it is written whole or not at all, and only its owner can read it.
 
 #include "built_files.h"
 #include "expect_result.h"
@@ -54,7 +54,7 @@ TEST_F(TokenFile, IsNotReplacedWithoutForce) {
   m_folder.Write("token.xml", "what was there");
   ExpectResult(Run(Line()), 7, "", "ssoclient: file: token.xml: already exists; --force replaces it\n");
   EXPECT_EQ("what was there", m_folder.Read("token.xml"));
-  EXPECT_EQ("", m_service.GetLog()); // nothing was asked of the service
+  EXPECT_EQ("", m_service.GetLog()); // the service received no request
 }
 
 TEST_F(TokenFile, IsReplacedWithForceAndThenReadableOnlyForItsOwner) {
@@ -65,7 +65,7 @@ TEST_F(TokenFile, IsReplacedWithForceAndThenReadableOnlyForItsOwner) {
   EXPECT_EQ(WithToken(), m_folder.Names());
 }
 
-TEST_F(TokenFile, ThatIsCreatedInTheMeantimeIsNotReplacedWithoutForce) {
+TEST_F(TokenFile, ThatAppearsDuringTheRunIsNotReplacedWithoutForce) {
   TerminalSession session(
       ShellCommand("exec ssoclient acquire " + Service() + "--user alice@corp.example --format xml --out token.xml"),
       m_folder.Path());

@@ -8,7 +8,7 @@ namespace ToolTest {
 
 std::string AttributeIn(const std::string &xml, const std::string &name) {
   const std::string start = name + "=\"";
-  // A blank, or the colon of a prefix, precedes the name, so that it is not the end of a longer name.
+  // A blank or the colon of a prefix must precede the name; otherwise it is the end of a longer name.
   for (std::size_t at = xml.find(start, 1); at != std::string::npos; at = xml.find(start, at + 1)) {
     const std::size_t begin = at + start.size();
     const std::size_t end = xml.find('"', begin);

@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// Values that differ from token to token, read from its XML.
+/// Values that differ from token to token, read from a token's XML.
 
 #pragma once
 

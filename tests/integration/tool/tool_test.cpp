@@ -1,5 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
-// What the tool prints, asserted whole, and how it ends.
+// What the tool prints, and its exit codes.
 
 #include "expect_result.h"
 #include "process.h"
@@ -41,7 +41,7 @@ std::string ExpectedJson(const std::string &file, bool verified) {
   return Fill(Expected(file), "@VERIFIED@", verified ? "true" : "false");
 }
 
-/// A file that is deleted at the end.
+/// A file that is deleted at the end of the scope.
 class TemporaryFile {
 public:
   explicit TemporaryFile(const std::string &content)
@@ -121,7 +121,7 @@ struct Refusal {
   int exitCode;
   const char *exceptionClass;
   const char *label;
-  const char *message; ///< as in text; contains nothing that JSON escapes
+  const char *message; ///< in text; contains nothing that JSON escapes
 };
 
 const Refusal REFUSALS[] = {
@@ -143,7 +143,7 @@ const Refusal REFUSALS[] = {
      "InvalidSignatureException",
      "signature invalid",
      "Failed to verify signature: token might have been tampered with."},
-    {"TokenThatIsNoXml",
+    {"TokenThatIsNotXml",
      {"--trust", "sts-rsa.crt", "sts-rsa.crt"},
      5,
      "XMLParseException",
@@ -187,7 +187,7 @@ const Refusal REFUSALS[] = {
      "certificate-with-key.pem: Holds a private key (PRIVATE KEY) where only certificates belong"},
     {"NoTrustFile", {"bearer.xml"}, 2, "UsageException", "usage", "--trust is required; see ssoclient --help"},
     {"NoToken", {"--trust", "sts-rsa.crt"}, 2, "UsageException", "usage", "FILE is required; see ssoclient --help"},
-    {"ToleranceThatIsNoNumber",
+    {"ToleranceThatIsNotANumber",
      {"--tolerance", "1x", "--trust", "sts-rsa.crt", "bearer.xml"},
      2,
      "UsageException",
@@ -276,7 +276,7 @@ TEST(Tool, EscapesControlCharactersAfterOctetsThatAreNotUtf8) {
 }
 
 TEST(Tool, RefusesADocumentBeyondTheLimitWithoutReadingItAll) {
-  // Twice the limit. The tool does not read all of it, so that writing the rest may fail.
+  // Twice the limit. The tool does not read all of it, so writing the rest may fail.
   const Result result = RunTool({"inspect", "-"}, "<x>" + std::string(32u * 1024 * 1024, 'a'));
   EXPECT_EQ(5, result.exitCode);
   EXPECT_EQ("", result.out);

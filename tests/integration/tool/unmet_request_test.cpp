@@ -85,7 +85,7 @@ TEST_F(UnmetRequest, IsAnotherAudienceThanWasAskedFor) {
             result.err);
 }
 
-TEST_F(UnmetRequest, IsNotWhatWasNotAskedFor) {
+TEST_F(UnmetRequest, IsNotReportedForWhatWasNotAskedFor) {
   ExpectResult(Run("ssoclient acquire " + Service("plain-token") + PASSWORD + "--format xml >token.xml"), 0, "", "");
 }
 
@@ -101,7 +101,7 @@ TEST_F(UnmetRequest, OfARenewalIsOnlyTheLifetime) {
   EXPECT_EQ(Warning("a lifetime of 1200 seconds; the token ends at " + EndOf("renewed.xml")), shorter.err);
 }
 
-TEST_F(UnmetRequest, IsNotAKeyWhenTheCommandDoesNotAcquireAToken) {
+TEST_F(UnmetRequest, HasNoJsonKeyWhenTheCommandDoesNotAcquireAToken) {
   Acquire("token.xml", PASSWORD);
   for (const char *command : {"verify --trust sts.pem", "inspect"}) {
     const Result result = Run(std::string("ssoclient ") + command + " --format json token.xml");
@@ -191,7 +191,7 @@ TEST_F(DoubtfulRequest, IsNotARequestThatTheServiceGrants) {
   ExpectResult(Run("ssoclient acquire " + Service() + PASSWORD + IDENTITY + "--format xml >token.xml"), 0, "", "");
 }
 
-TEST_F(DoubtfulRequest, HasNoHintWithoutADoubt) {
+TEST_F(DoubtfulRequest, IsNotEveryRequestThatTheServiceRefuses) {
   ExpectResult(Run("ssoclient acquire " + Service("soap-fault-InvalidRequest") + PASSWORD), 8, "",
                "ssoclient: service fault: Unexpected SOAP fault: wst:InvalidRequest; request failed.\n");
 }

@@ -73,7 +73,7 @@ TEST(WsseUsernameTokenBuilder, WritesEmptyNamesAndPasswordsAsEmptyTexts) {
                 "oasis-200401-wss-username-token-profile-1.0#PasswordText\"></wsse:Password></wsse:UsernameToken>");
 }
 
-TEST(WsseX509v3BinarySecTokenBuilder, HoldsTheCertificateAsBase64WithoutDeclaringWsse) {
+TEST(WsseX509v3BinarySecTokenBuilder, ContainsTheCertificateAsBase64AndDoesNotDeclareWsse) {
   const std::string pem = ReadDataFile("tokens/holder.crt");
   const auto certificate = Tarvel::Crypto::CreateCertificateFromPem(pem);
   // The body of the PEM text, without its line ends, is the same encoding.

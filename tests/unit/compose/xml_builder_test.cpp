@@ -129,7 +129,7 @@ TEST(SerializeToXML, WritesTextAndAttributeValuesInAscii) {
   EXPECT_EQ(SerializeToXML(builder), "<p:e a=\"&#xFC;&lt;\">&#x142;x&#x8A9E;&#x1F600;&amp;</p:e>");
 }
 
-TEST(SerializeToXML, KeepsInAPreBuiltElementWhatCannotBeAReference) {
+TEST(SerializeToXML, KeepsNamesAndCommentsOfAPreBuiltElementUnchanged) {
   Tarvel::Ref<Tarvel::Xml::Document> document;
   ParseXML("<ü><!--ü-->ü</ü>", document);
   const Tarvel::Ref<Tarvel::Xml::ElementNode> root(document->GetDocumentElement());

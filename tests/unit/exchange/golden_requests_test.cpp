@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 // Compares every request byte for byte with its file in tests/data/requests. A change of the wire format is a difference in
-// these files. With SSOCLIENT_UPDATE_GOLDEN=1 the test writes them again and then fails, so that this is never unnoticed.
+// these files. With SSOCLIENT_UPDATE_GOLDEN=1 the test writes them again and then fails, so that every change is noticed.
 #include "support/data_file.h"
 #include "support/fixed_environment.h"
 #include "support/sample_requests.h"
@@ -19,7 +19,7 @@ using namespace Testing;
 
 class GoldenRequest : public testing::TestWithParam<SampleRequest> {};
 
-TEST_P(GoldenRequest, IsByteForByteThatOfItsFile) {
+TEST_P(GoldenRequest, EqualsItsFileByteForByte) {
   const FixedEnvironment environment;
   Request request;
   GetParam().build(request);

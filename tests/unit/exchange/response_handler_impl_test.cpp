@@ -32,7 +32,7 @@ using Testing::ResponseElement;
 
 const char ASSERTION[] = "<saml:Assertion xmlns:saml='urn:oasis:names:tc:SAML:2.0:assertion' ID='_1'><!-- gone -->"
                          "<saml:Issuer a='1'/></saml:Assertion>";
-/// Its inclusive canonical form within an envelope of `Testing::Envelope`.
+/// The inclusive canonical form of `ASSERTION` within an envelope of `Testing::Envelope`.
 const char CANONICAL_ASSERTION[] =
     R"(<saml:Assertion xmlns:saml="urn:oasis:names:tc:SAML:2.0:assertion")"
     R"( xmlns:soapenv="http://schemas.xmlsoap.org/soap/envelope/")"

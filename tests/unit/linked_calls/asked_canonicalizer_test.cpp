@@ -23,7 +23,7 @@ std::vector<std::string> g_askedFor;
 
 } // namespace
 
-// The linker replaces the platform's function by the second of these. The first one is the platform's function.
+// The first of these is the platform's function. The linker redirects the library's calls of it to the second.
 
 #define CREATE_CANONICALIZER                                                                                           \
   "_ZN6Tarvel3Xml8Security19CreateCanonicalizerESt17basic_string_viewIcSt11char_traitsIcEERKSt6vectorINSt7__cxx1112"   \
@@ -43,7 +43,7 @@ Ref<Canonicalizer> NotedCreateCanonicalizer(std::string_view uri, const std::vec
 
 namespace {
 
-TEST(CreateSamlTokenFromDom, AsksForInclusiveCanonicalXmlWithALoneNumberSign) {
+TEST(CreateSamlTokenFromDom, AsksForInclusiveCanonicalXmlByAUriThatEndsInANumberSign) {
   const Testing::FixedEnvironment environment;
   const Testing::ParsedDocument document(Testing::ReadDataFile("tokens/bearer.xml"));
   const auto trusted = Tarvel::Crypto::LoadCertificates(Testing::DataPath("tokens/sts-rsa.crt"));

@@ -36,7 +36,7 @@ private:
 
 } // namespace
 
-// The linker calls this instead of the platform's function.
+// The linker redirects the library's calls of the platform's function to this.
 Ref<Logger> CreateLoggerAndWait(const Ref<LogRoot> &root, std::string name,
                                 int level) asm("__wrap__ZN6Tarvel7Service6Logger12CreateLoggerERKNS_3RefINS0_"
                                                "7LogRootEEENSt7__cxx1112basic_stringIcSt11char_traitsIcESa"

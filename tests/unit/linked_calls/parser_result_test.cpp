@@ -1,5 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
-// Parsers that return nothing, or an object that is not a document. The platform's own parser never does.
+// What happens when a parser returns nothing, or an object that is not a document. The platform's parser never does so.
 #include "xml/xml_text.h"
 
 #include "support/throws_message.h"
@@ -38,7 +38,7 @@ public:
 
 } // namespace
 
-// The linker replaces the platform's function by the second of these. The first one is the platform's function.
+// The first of these is the platform's function. The linker redirects the library's calls of it to the second.
 
 #define CREATE_PARSER "_ZN6Tarvel3Xml15CreateXMLParserERKNS_3RefINS0_10XMLHandlerEEE"
 

@@ -32,7 +32,7 @@ protected:
   ~WithOneMore() = default;
 };
 
-/// The virtual one of the overloads of a name.
+/// The type of the overload that sets a `Value`, which is the virtual one.
 template <typename Value>
 using Sets = void (SamlToken::*)(Value &) const;
 
@@ -81,7 +81,7 @@ TYPED_TEST(SlotsOfException, AreThoseOfThePlatformsClass) {
   EXPECT_EQ((std::vector<std::size_t>{2, 3, 4, 5, 6, 7, 8}), slots);
 }
 
-// Each class inherits these four from the platform's, and overrides the other two.
+// Each class inherits the first four from the platform's class, and overrides the last two.
 template <typename Exception>
 constexpr bool OVERRIDES_CLONE_AND_THROW_ALONE =
     std::is_same_v<decltype(&Exception::what), decltype(&Tarvel::Exception::what)>

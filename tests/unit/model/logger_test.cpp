@@ -16,7 +16,7 @@ namespace {
 using SsoClient::getLogger;
 using Tarvel::Service::LogInternal;
 
-// First in this file. The test driver starts a process for each test, so these are the first calls.
+// First in this file. `scripts/test` starts a process for each test, so these are the first calls.
 TEST(GetLogger, ReturnsTheSameLoggerToThreadsThatCallItFirstAtTheSameTime) {
   constexpr std::size_t THREADS = 8;
   std::atomic<std::size_t> ready{0};

@@ -28,10 +28,10 @@ TEST(PrincipalIdEquality, IgnoresLetterCaseBeyondAscii) {
   EXPECT_TRUE((PrincipalId{"j\u00fcrgen", "corp"} == PrincipalId{"J\u00dcRGEN", "CORP"}));
 }
 
-TEST(PrincipalIdEquality, HoldsForDistinctLettersOfOneUpperCaseForm) {
+TEST(PrincipalIdEquality, HoldsForDistinctLettersWithTheSameUpperCaseForm) {
   EXPECT_TRUE((PrincipalId{"\u0131ris", "corp"} == PrincipalId{"iris", "corp"}));     // dotless i
   EXPECT_TRUE((PrincipalId{"alice", "\u017fales"} == PrincipalId{"alice", "sales"})); // long s
-  EXPECT_FALSE((PrincipalId{"\u0130ris", "corp"} == PrincipalId{"iris", "corp"}));    // I with a dot stays itself
+  EXPECT_FALSE((PrincipalId{"\u0130ris", "corp"} == PrincipalId{"iris", "corp"}));    // I with a dot is upper case
 }
 
 TEST(PrincipalIdEquality, DoesNotHoldForOtherNamesAndDomains) {
@@ -88,7 +88,7 @@ TEST(PrincipalId, IsAKeyOfSetsWhateverItsLetterCase) {
   EXPECT_EQ(ordered.count({"BOB", "CORP"}), 1u);
 }
 
-/// A text of up to three letters, of which many differ in case only, some are outside ASCII, and one byte is not UTF-8.
+/// Up to three of these letters: many differ only in case, some are outside ASCII, and one byte is not UTF-8.
 std::string RandomText(std::mt19937 &random) {
   const std::vector<std::string> letters{"a",      "A",      "i",      "I",      "\u0131", "\u0130", "s", "S",
                                          "\u017f", "\u00fc", "\u00dc", "\u03c3", "\u03a3", "\u03c2", "1", "\xff"};

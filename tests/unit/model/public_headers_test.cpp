@@ -33,7 +33,7 @@ TEST(UmbrellaHeader, IncludesAllOtherPublicHeadersOfTheClient) {
   EXPECT_EQ(included, expected);
 }
 
-// One name of each kind: the header is enough for a program.
+// Both types are complete: a program needs no other header.
 static_assert(sizeof(SsoClient::SecurityTokenServiceConfig) > 0 && sizeof(SsoClient::PrincipalIdLess) > 0);
 
 } // namespace

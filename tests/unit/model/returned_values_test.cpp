@@ -1,5 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
-// The functions that return their result: each gives what its counterpart with an out-parameter gives.
+// The functions that return their result: each returns what its overload with an out-parameter sets.
 
 #include "support/data_file.h"
 #include "support/reporting_ssl_context.h"
@@ -96,7 +96,7 @@ TEST(CreateSsoSSLConnectionSpec, ReturnsOrSetsASpecificationOfThatAddress) {
   EXPECT_EQ(HostAndEndpoint(*set), (Texts{"other.example", "other.example:443"}));
 }
 
-TEST(CreateSsoSSLConnectionSpec, HoldsTheContextUntilTheSpecificationIsDestroyed) {
+TEST(CreateSsoSSLConnectionSpec, KeepsTheContextUntilTheSpecificationIsDestroyed) {
   const auto isDestroyed = std::make_shared<bool>(false);
   auto spec = CreateSsoSSLConnectionSpec("sts.example", 7443,
                                          Tarvel::MakeRef<Testing::ReportingSslContext>(isDestroyed), "", false);

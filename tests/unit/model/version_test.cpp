@@ -21,7 +21,7 @@ TEST(Version, NumberGrowsWithEachPart) {
   EXPECT_LT(SSOCLIENT_MAKE_VERSION(0, 999, 999), SSOCLIENT_MAKE_VERSION(1, 0, 0));
 }
 
-// The condition is one that the preprocessor understands.
+// The preprocessor must be able to compare versions.
 #if SSOCLIENT_VERSION_NUMBER < SSOCLIENT_MAKE_VERSION(0, 1, 0)
 #error "The first version is 0.1.0."
 #endif

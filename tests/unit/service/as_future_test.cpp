@@ -38,13 +38,14 @@ std::string Issued() {
   return "issued:" + Testing::ReadDataFile("tokens/bearer.xml");
 }
 
-/// Whether the future becomes ready, within a bound that only a failure reaches.
+/// Whether the future becomes ready within 10 seconds. Only a failing test waits that long.
 template <typename Result>
 bool IsReady(const std::future<Result> &future) {
   return future.wait_for(std::chrono::seconds(10)) == std::future_status::ready;
 }
 
-/// The code of the `std::future_error` with which the future ends; none when it ends otherwise.
+/// The code of the `std::future_error` that the future throws, `timed_out` when it does not become ready, and no error
+/// when it has a result.
 template <typename Result>
 std::error_code BrokenPromiseOf(std::future<Result> future) {
   if (!IsReady(future)) {
@@ -85,7 +86,7 @@ TEST(AsFuture, PassesTheArgumentsOfEachOperationOn) {
                                                          "4: Renew 4", "5: ValidateSubject"}));
 }
 
-TEST(AsFuture, TakesAHandlerOfTheCallersOwnClass) {
+TEST(AsFuture, AcceptsAHandlerOfTheCallersOwnClass) {
   const auto service = ServiceThatAnswers("leg:context||" + Testing::ReadDataFile("tokens/bearer.xml"));
   const std::vector<std::shared_ptr<Testing::Bytes>> script{Testing::Leg("hello")};
   const auto handler = std::make_shared<Testing::NegotiationHandlerStandIn>(script);
@@ -115,7 +116,7 @@ TEST(AsFuture, ThrowsTheRefusalOfANullTokenInItsOwnClass) {
 }
 
 TEST(AsFuture, EndsAsABrokenPromiseWhenTheCompletionIsNotCalled) {
-  const Testing::RecordedLog log; // of the exceptions that leave the pool's work items
+  const Testing::RecordedLog log; // gets the lines about exceptions that leave work items
   const auto service = ServiceOn(std::make_shared<TransportStandIn>(
       [](const Request &) -> std::string { throw std::range_error("not a Tarvel exception"); }));
   EXPECT_EQ(BrokenPromiseOf(AsFuture(*service, &Service::AcquireTokenByCertificateAsync, SpecFor(60))),

@@ -35,7 +35,7 @@ using Testing::TransportStandIn;
 using TokenPtr = std::shared_ptr<const SamlToken>;
 using Texts = std::vector<std::string>;
 
-/// Makes objects whose destruction is counted.
+/// Makes an object whose destruction is counted.
 template <typename T, typename... Args>
 std::shared_ptr<T> MakeCounted(const std::shared_ptr<EventCount> &destroyed, Args &&...args) {
   return std::shared_ptr<T>(new T(std::forward<Args>(args)...), [destroyed](T *object) {
@@ -135,7 +135,7 @@ TEST_P(EachAsyncOperation, KeepsItsArgumentsUntilItEndsAndNoLonger) {
   EXPECT_TRUE(m_tokenGone->WaitFor(1));
 }
 
-TEST_P(EachAsyncOperation, ReportsAFailureOnceWithTheExceptionAlone) {
+TEST_P(EachAsyncOperation, ReportsAFailureOnceWithTheExceptionAndNoResult) {
   auto transport = MakeCounted<TransportStandIn>(m_transportGone, [](const Request &) { return "fault:refused"; });
   const OperationOutcome outcome;
   GetParam().start(*ServiceOn(transport), std::make_shared<CountingToken>(), outcome);
@@ -209,7 +209,7 @@ TEST(AsyncOperations, LogAnExceptionOfTheCompletionAndThePoolContinues) {
   ASSERT_TRUE(log.WaitForLines(2));
   const std::string line = "Tarvel 8 An exception left a work item of the thread pool: SsoClient::SsoException: ";
   EXPECT_EQ(log.Lines(), (Texts{line + "thrown on success", line + "thrown on failure"}));
-  EXPECT_EQ(calls->Get(), 2); // a Tarvel exception of the completion's own is not reported to it again
+  EXPECT_EQ(calls->Get(), 2); // an exception that the completion throws is not reported to it
   const OperationOutcome outcome;
   service->AcquireTokenByCertificateAsync(SpecFor(60), outcome.ForToken());
   EXPECT_EQ(outcome.Wait(), Texts{"null"});
@@ -242,7 +242,7 @@ TEST(AsyncOperations, AllCompleteWhenAThousandWaitForAServiceThatStalls) {
     service->AcquireTokenAsync("alice", "pass", SpecFor(i % 10), outcome.ForToken());
   }
   service.reset();
-  // The pool has no more threads than this; the others wait in its queue.
+  // The pool has no more threads than this; the other operations wait in its queue.
   ASSERT_TRUE(gate->WaitForArrivals(Tarvel::System::DEFAULT_THREAD_CEILING));
   EXPECT_EQ(outcome.Wait(0), Texts{});
   gate->Open();

@@ -1,5 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
-// The service with its real request builder and response handler: only the network is missing.
+// The service with its real request builder and response handler; only the network is replaced.
 #include "exchange/request_builder_impl.h"
 #include "exchange/response_handler_impl.h"
 #include "support/identity.h"
@@ -44,7 +44,7 @@ protected:
   void ExpectAlicesToken(const std::shared_ptr<const SamlToken> &token) const {
     ASSERT_NE(token, nullptr);
     EXPECT_EQ(token->GetSubject().ToString(), "{Name: alice; Domain:corp.example}");
-    // The assertion is a document of its own.
+    // The token's text is a complete document.
     EXPECT_NE(CreateSamlToken(token->ToXml(), Testing::TrustedCertificates()), nullptr);
   }
 

@@ -175,7 +175,7 @@ TEST_P(AcquireTokenByGssFinalLeg, IsPassedToTheHandlerWhoseAnswerIsNeverSent) {
   EXPECT_EQ(log.Lines(), lines);
 }
 
-INSTANTIATE_TEST_SUITE_P(WarnsWhenTheAnswerIsNothing, AcquireTokenByGssFinalLeg,
+INSTANTIATE_TEST_SUITE_P(WarnsWhenTheAnswerIsNullOrEmpty, AcquireTokenByGssFinalLeg,
                          testing::Values(FinalAnswer{"Null", nullptr, true}, FinalAnswer{"Empty", Leg(""), true},
                                          FinalAnswer{"NonEmpty", Leg("x"), false}),
                          [](const auto &answer) { return std::string(answer.param.name); });

@@ -52,7 +52,7 @@ struct LoggedOperation {
   bool yieldsToken;
   std::function<void(const SecurityTokenService &, const SamlToken &)> run;
   Texts request; ///< the lines about the request
-  Texts result;  ///< the lines about success before the one about the token
+  Texts result;  ///< the lines about success, without the one about the token
 };
 
 void PrintTo(const LoggedOperation &operation, std::ostream *out) {
@@ -167,7 +167,7 @@ TEST_P(OperationLog, ContainsStartRequestAndEndButNoSendingWhenTheRequestCannotB
   EXPECT_EQ(log.Lines(), FrameOf(GetParam().name, {{GetParam().request.front()}}));
   EXPECT_EQ(transport->Sent(), Texts{});
   EXPECT_EQ(transport->CountSessions(),
-            GetParam().name == std::string("AcquireTokenByGSS") ? 1 : 0); // for all its legs
+            GetParam().name == std::string("AcquireTokenByGSS") ? 1 : 0); // one for all its legs
   EXPECT_EQ(transport->CountOpenSessions(), 0);
 }
 

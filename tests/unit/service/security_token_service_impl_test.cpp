@@ -142,7 +142,7 @@ TEST_P(EachTokenOperationButGss, ReleasesItsSessionBeforeTheResponseIsRead) {
 
 std::vector<TokenOperation> TokenOperationsButGss() {
   std::vector<TokenOperation> operations = TokenOperations();
-  operations.erase(operations.begin() + 1); // its loop never ends with an empty token
+  operations.erase(operations.begin() + 1); // AcquireTokenByGSS, which continues until it has a token
   return operations;
 }
 

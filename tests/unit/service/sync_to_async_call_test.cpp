@@ -42,7 +42,7 @@ TEST(SyncCallToResultFunc, ReportsTheCaughtExceptionItselfWithTheFailureValue) {
                          ++calls;
                          EXPECT_FALSE(result);
                          EXPECT_THROWS_MESSAGE(failure->Throw(), ParseException, "refused");
-                         EXPECT_TRUE(std::current_exception()); // while it is being handled
+                         EXPECT_TRUE(std::current_exception()); // the exception is still being handled
                        },
                        boost::optional<bool>());
   EXPECT_EQ(calls, 1);

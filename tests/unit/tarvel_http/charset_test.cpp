@@ -104,7 +104,7 @@ TEST(RecodeToUtf8, ReplacesTheSameCharsetInTheXmlDeclaration) {
   }
 }
 
-TEST(RecodeToUtf8, LeavesADeclarationOfAnotherEncodingAndABrokenOne) {
+TEST(RecodeToUtf8, LeavesADeclarationOfAnotherEncodingAndABrokenOneUnchanged) {
   for (const char *const start :
        {"<?xml version=\"1.0\" encoding=\"windows-1252\"?>", "<?xml version=\"1.0\"?>", "<?xml encoding=\"latin1\"",
         "<?xml encoding=latin1?>", "<?xml encoding=\"latin1'?>", "<?xml encoding?>", "<?xml encoding", "<?xml",

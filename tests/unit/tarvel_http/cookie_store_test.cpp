@@ -21,7 +21,7 @@ namespace {
 constexpr std::int64_t SECOND = 1000000;
 constexpr std::int64_t START = 1767323045 * SECOND; // 2026-01-02T03:04:05Z
 
-/// A store on a clock that only the test moves.
+/// A store with a clock that only the test changes.
 class CookieStoreTest : public testing::Test {
 protected:
   void Set(std::string_view header, std::string_view host = "sts.example", std::string_view path = "/STS/trust",

@@ -13,7 +13,7 @@ namespace {
 
 using Testing::SlotOf;
 
-TEST(Stream, HasItsOperationsInOneOrder) {
+TEST(Stream, HasItsOperationsInTheDeclaredOrder) {
   const auto first = SlotOf(&System::Stream::AsyncReadSome);
   EXPECT_GT(first, 0);
   EXPECT_EQ(SlotOf(&System::Stream::AsyncWrite), first + 1);
@@ -21,20 +21,20 @@ TEST(Stream, HasItsOperationsInOneOrder) {
   EXPECT_EQ(SlotOf(&System::Stream::IsSecure), first + 3);
 }
 
-TEST(UserAgent, HasItsOperationsInOneOrder) {
+TEST(UserAgent, HasItsOperationsInTheDeclaredOrder) {
   const auto first = SlotOf(&UserAgent::StartRequest);
   EXPECT_GT(first, 0);
   EXPECT_EQ(SlotOf(&UserAgent::WaitForRequest), first + 1);
 }
 
-TEST(CookieStore, HasItsOperationsInOneOrder) {
+TEST(CookieStore, HasItsOperationsInTheDeclaredOrder) {
   const auto first = SlotOf(&CookieStore::SetFromHeader);
   EXPECT_GT(first, 0);
   EXPECT_EQ(SlotOf(&CookieStore::GetHeader), first + 1);
   EXPECT_EQ(SlotOf(&CookieStore::GetCount), first + 2);
 }
 
-TEST(ClientRequest, HasItsOperationsInOneOrder) {
+TEST(ClientRequest, HasItsOperationsInTheDeclaredOrder) {
   const auto first = SlotOf(&ClientRequest::SetHeader);
   EXPECT_GT(first, 0);
   EXPECT_EQ(SlotOf(&ClientRequest::WriteBody), first + 1);

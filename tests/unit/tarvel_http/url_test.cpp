@@ -75,7 +75,7 @@ INSTANTIATE_TEST_SUITE_P(
 struct InvalidUrl {
   std::string url;
   std::string reason;
-  std::string quoted = {}; ///< as the message shows it; empty when unchanged
+  std::string quoted = {}; ///< the URL in the message; empty when unchanged
 };
 
 void PrintTo(const InvalidUrl &invalid, std::ostream *out) {
@@ -84,7 +84,7 @@ void PrintTo(const InvalidUrl &invalid, std::ostream *out) {
 
 class ParseHttpURLRefuses : public testing::TestWithParam<InvalidUrl> {};
 
-TEST_P(ParseHttpURLRefuses, WithUrlAndReasonAndLeavesTheOutputsAlone) {
+TEST_P(ParseHttpURLRefuses, WithUrlAndReasonAndDoesNotChangeTheOutputs) {
   const InvalidUrl &invalid = GetParam();
   bool isSecure = true;
   std::string host = "before";

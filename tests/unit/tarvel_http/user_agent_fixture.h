@@ -40,7 +40,7 @@ public:
     m_write = std::move(handler);
   }
 
-  /// What the last write was to send.
+  /// The bytes of the last write.
   std::string GetWritten() {
     const std::lock_guard<std::mutex> lock(m_mutex);
     return m_written;
@@ -73,7 +73,7 @@ private:
   int m_writes = 0;
 };
 
-/// Connects to one stream; without one it throws.
+/// Connects to one stream, or throws when that is null.
 class OneStreamSpec : public CustomConnectionSpec {
 public:
   explicit OneStreamSpec(const Ref<System::Stream> &stream) : m_stream(stream) {}

@@ -119,7 +119,7 @@ TEST_F(UserAgentTest, RefusesObjectsThatItCannotUse) {
                         "Invalid argument : the item to wait for is not a started HTTP request.");
 }
 
-TEST_F(UserAgentTest, IsNotMadeWithoutASpecificationOrACookieStoreOrWithAPool) {
+TEST_F(UserAgentTest, CannotBeMadeWithoutASpecificationOrACookieStoreNorWithAPool) {
   const std::string needed = "Invalid argument : a user agent needs a connection specification and a cookie store.";
   const Ref<ConnectionSpec> spec = MakeRef<OneStreamSpec>(nullptr);
   Ref<UserAgent> agent;
@@ -134,7 +134,7 @@ TEST_F(UserAgentTest, IsNotMadeWithoutASpecificationOrACookieStoreOrWithAPool) {
   EXPECT_FALSE(agent);
 }
 
-/// A host's own stream that encrypts, or so it says.
+/// A host's own stream that reports that it is secure.
 class SecureStream final : public AnsweringStream {
 public:
   using AnsweringStream::AnsweringStream;

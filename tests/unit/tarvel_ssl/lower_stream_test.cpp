@@ -56,7 +56,7 @@ private:
   std::atomic<bool> m_isBroken{false};
 };
 
-/// A TLS connection on which writing breaks, before or after the handshake, and reading goes on.
+/// A TLS connection on which all writes fail, from before the handshake or only after it. Reads still succeed.
 class BrokenConnection {
 public:
   BrokenConnection(int port, bool beforeTheHandshake) {
@@ -95,7 +95,7 @@ private:
   Ref<SSLContext> m_context;
 };
 
-/// A host's own stream. Each start throws what the test chooses.
+/// A host's own stream. Each start of a read or a write throws what the test chooses.
 class ThrowingStream final : public System::Stream {
 public:
   explicit ThrowingStream(std::function<void()> start) : m_start(std::move(start)) {}

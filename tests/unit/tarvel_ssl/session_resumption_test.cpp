@@ -22,7 +22,7 @@ using Testing::TlsCertificate;
 using Testing::TlsClient;
 using Testing::TlsSettings;
 
-/// Sends the client how the server sees the handshake: "resumed" or "full".
+/// Sends to the client what kind of handshake the server has made: "resumed" or "full".
 void ReportWhetherResumed(ServerConnection &connection) {
   if (connection.Handshake()) {
     connection.Write(connection.WasResumed() ? "resumed" : "full");
@@ -69,7 +69,7 @@ TEST_P(SessionResumption, ResumesTheSessionOfAConnectionThatWasOnlyReleased) {
     ASSERT_EQ(client.Handshake(), "");
     ASSERT_EQ(client.Read(), "full");
   }
-  EXPECT_TRUE(Testing::Eventually([this] { return CountSessions() > 0; })); // an I/O thread may still hold a reference
+  EXPECT_TRUE(Testing::Eventually([this] { return CountSessions() > 0; })); // an I/O thread may still have a reference
   EXPECT_EQ(Connect(), "resumed");
 }
 

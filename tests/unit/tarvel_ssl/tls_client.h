@@ -30,7 +30,7 @@ inline Tarvel::Ref<Tarvel::Ssl::SSLContext> CreateTrustingContext() {
   return context;
 }
 
-/// Each step waits for its end and returns the message of its failure; empty without one.
+/// Each step waits until it has ended, and returns the message of its failure or an empty text.
 class TlsClient {
 public:
   /// Connects to the server, without a handshake.

@@ -1,5 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
-// The records of an assertion are aggregates. Their fields are in the order of the elements and attributes of the schema.
+// The records of an assertion are aggregates. Their fields have a fixed order, on which braced initialisers rely.
 #include "token/assertion_model.h"
 
 #include "support/declared_order.h"

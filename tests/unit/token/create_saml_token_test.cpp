@@ -39,7 +39,7 @@ CertificateList Trusted(const std::string &name = "sts-rsa") {
   return Tarvel::Crypto::LoadCertificates(DataPath("tokens/" + name + ".crt"));
 }
 
-/// It is 2026-01-02T03:04:05Z in all of these tests.
+/// In all of these tests the time is 2026-01-02T03:04:05Z.
 class CreateSamlTokenTest : public ::testing::Test {
 private:
   Tarvel::ScopedEnvironment m_clock{{[] { return DateTime("2026-01-02T03:04:05Z").GetUtcTime(); }, {}}};
@@ -318,12 +318,12 @@ TEST_F(CreateSamlTokenTest, ChecksSyntaxThenPropertiesThenSignature) {
 }
 
 TEST_F(CreateSamlTokenTest, VerifiesBeforeItReadsTheFacts) {
-  // The name is malformed, but nothing of a token that was changed is reported.
+  // The name is malformed, but nothing in a token that was changed is reported.
   const std::string tampered = ReplaceOnce(Fixture("bearer"), ">alice@corp.example<", ">alice<");
   EXPECT_THROWS_MESSAGE(CreateSamlToken(tampered, Trusted()), InvalidSignatureException, TAMPERED);
 }
 
-/// A prefix of a token is refused with one of the documented classes. Which one depends on where the text ends.
+/// Expects a refusal with one of the documented classes. Which one it is depends on where the text ends.
 void ExpectRefused(const std::string &xml, const CertificateList &trusted) {
   try {
     CreateSamlToken(xml, trusted);
@@ -349,7 +349,7 @@ TEST_F(CreateSamlTokenTest, RefusesATokenWithAnyCharacterChanged) {
   const std::string xml = Fixture("full");
   const std::size_t begin = xml.find("<saml:Assertion");
   const std::size_t signature = xml.find("<ds:KeyInfo");
-  // Line ends and blanks inside the signature's own tags and Base64 text, and the key's description, are not signed.
+  // The key's description is not signed, nor are blanks and line ends inside the signature's own tags and Base64 text.
   for (std::size_t position = begin; position < EndOfAssertion(xml); ++position) {
     const bool unsignedText = position >= signature && position < xml.find("</ds:Signature>");
     if (unsignedText || xml[position] == ' ' || xml[position] == '\n') {

@@ -1,5 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
-// Which of two faults of an assertion is reported: relying parties and support rely on it being the first.
+// When an assertion has two faults, the first in a fixed order is reported: relying parties and support rely on that.
 #include "support/parsed_document.h"
 #include "support/throws_message.h"
 #include "token/assertion_parser.h"
@@ -34,7 +34,7 @@ void ParseChanged(std::string text, const std::vector<Change> &changes) {
   ParseSamlAssertionElement(iterator, assertion);
 }
 
-/// Each change alone must be refused with its own message, and both with the message of the first.
+/// Each change by itself must be refused with its own message, and both together with the message of the first.
 void ExpectFirst(const std::string &valid, const Change &first, const std::string &message, const Change &second,
                  const std::string &secondMessage) {
   SCOPED_TRACE(message + " | " + secondMessage);
@@ -70,7 +70,7 @@ TEST(RefusalOrder, RequiredAttributesOfTheAssertionAreVersionThenIdThenIssueInst
               Missing("saml:Assertion", "IssueInstant"));
 }
 
-TEST(RefusalOrder, AMissingAttributeComesBeforeAnUnexpectedOne) {
+TEST(RefusalOrder, AMissingAttributeIsReportedBeforeAnUnexpectedOne) {
   ExpectFirst(BearerAssertion(), NO_ISSUE_INSTANT, Missing("saml:Assertion", "IssueInstant"),
               {" ID=\"_a1\"", " Extra=\"\" ID=\"_a1\""}, "Unexpected attributes on element 'saml:Assertion'");
 }
@@ -85,25 +85,25 @@ TEST(RefusalOrder, DatesOfTheConditionsAreReadInTheSameOrder) {
               NotADate("saml:Conditions", "NotOnOrAfter"));
 }
 
-TEST(RefusalOrder, AnElementsNamespaceComesBeforeItsAttributes) {
+TEST(RefusalOrder, AnElementsNamespaceIsCheckedBeforeItsAttributes) {
   ExpectFirst(BearerAssertion(), {"<saml:AuthnStatement ", "<saml:AuthnStatement xmlns:saml=\"urn:other\" "},
               "Element 'saml:AuthnStatement' has unexpected namespace", {" AuthnInstant=\"2026-01-01T00:00:03Z\"", ""},
               Missing("saml:AuthnStatement", "AuthnInstant"));
 }
 
-TEST(RefusalOrder, TheSetOfAttributesComesBeforeTheirValues) {
+TEST(RefusalOrder, TheSetOfAttributesIsCheckedBeforeTheirValues) {
   ExpectFirst(BearerAssertion(),
               {" NotOnOrAfter=\"2026-01-01T07:00:00Z\"", " NotOnOrAfter=\"2026-01-01T07:00:00Z\" Extra=\"\""},
               "Unexpected attributes on element 'saml:Conditions'", BAD_NOT_BEFORE,
               NotADate("saml:Conditions", "NotBefore"));
 }
 
-TEST(RefusalOrder, TheDateOfTheAssertionComesBeforeItsChildren) {
+TEST(RefusalOrder, TheDateOfTheAssertionIsCheckedBeforeItsChildren) {
   ExpectFirst(BearerAssertion(), {" IssueInstant=\"2026-01-01T00:00:00Z\"", " IssueInstant=\"\""},
               NotADate("saml:Assertion", "IssueInstant"), {Piece::ISSUER, ""}, NotFound("Issuer"));
 }
 
-TEST(RefusalOrder, TheDatesOfTheConditionsComeBeforeTheRestrictions) {
+TEST(RefusalOrder, TheDatesOfTheConditionsAreCheckedBeforeTheRestrictions) {
   for (const auto &date : {std::pair(BAD_NOT_BEFORE, "NotBefore"), std::pair(BAD_NOT_ON_OR_AFTER, "NotOnOrAfter")}) {
     ExpectFirst(BearerAssertion(), date.first, NotADate("saml:Conditions", date.second),
                 {Piece::PROXY_RESTRICTION, "<saml:OneTimeUse/>"},
@@ -111,19 +111,19 @@ TEST(RefusalOrder, TheDatesOfTheConditionsComeBeforeTheRestrictions) {
   }
 }
 
-TEST(RefusalOrder, TheDateOfADelegateComesBeforeItsName) {
+TEST(RefusalOrder, TheDateOfADelegateIsCheckedBeforeItsName) {
   ExpectFirst(BearerAssertion(), {"DelegationInstant=\"2026-01-01T00:00:02Z\"", "DelegationInstant=\"\""},
               NotADate("del:Delegate", "DelegationInstant"),
               {"<saml:NameID Format=\"urn:format:last\">backup@corp</saml:NameID>", ""}, NotFound("NameID"));
 }
 
-TEST(RefusalOrder, TheDateOfTheAuthnStatementComesBeforeItsContext) {
+TEST(RefusalOrder, TheDateOfTheAuthnStatementIsCheckedBeforeItsContext) {
   ExpectFirst(BearerAssertion(), {"AuthnInstant=\"2026-01-01T00:00:03Z\"", "AuthnInstant=\"\""},
               NotADate("saml:AuthnStatement", "AuthnInstant"), {Piece::CLASS_REF, ""},
               NotFound("AuthnContextClassRef"));
 }
 
-TEST(RefusalOrder, TheFormatOfANameComesBeforeItsText) {
+TEST(RefusalOrder, TheFormatOfANameIsCheckedBeforeItsText) {
   const std::string onlyText = " must only have textual content (but has extra children or is empty).";
   ExpectFirst(BearerAssertion(), {" Format=\"urn:format:issuer\"", ""}, Missing("saml:Issuer", "Format"),
               {"the issuer", ""}, "Element 'saml:Issuer'" + onlyText);
@@ -131,7 +131,7 @@ TEST(RefusalOrder, TheFormatOfANameComesBeforeItsText) {
               {"alice@corp", ""}, "Element 'saml:NameID'" + onlyText);
 }
 
-TEST(RefusalOrder, TheConfirmationMethodComesBeforeTheConfirmationData) {
+TEST(RefusalOrder, TheConfirmationMethodIsCheckedBeforeTheConfirmationData) {
   ExpectFirst(BearerAssertion(), {"Method=\"urn:oasis:names:tc:SAML:2.0:cm:bearer\"", "Method=\"\""},
               "Unknown subject confirmation method: ''", {Piece::BEARER_DATA, ""}, NotFound("SubjectConfirmationData"));
 }
@@ -149,7 +149,7 @@ TEST(RefusalOrder, BearerDataMustBeEmptyBeforeItsDateIsRead) {
                         "Element 'saml:SubjectConfirmationData' must be empty");
 }
 
-TEST(RefusalOrder, TheCountOfARestrictionComesBeforeItsContent) {
+TEST(RefusalOrder, TheCountOfARestrictionIsCheckedBeforeItsContent) {
   const std::string badCount = "/@Count is not a non-negative integer.";
   EXPECT_THROWS_MESSAGE(
       ParseChanged(BearerAssertion(),

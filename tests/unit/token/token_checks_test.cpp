@@ -48,7 +48,7 @@ protected:
     return assertion;
   }
 
-  /// A holder-of-key token, so that only the rule under test reads the end.
+  /// A holder-of-key token: with a bearer token, a second rule would compare the end.
   static SamlAssertionType ValidBetween(std::int64_t from, std::int64_t to) {
     SamlAssertionType assertion = HolderOfKey();
     assertion.Conditions.NotBefore = AtSecond(from);
@@ -136,7 +136,7 @@ TEST_F(CheckTokenPropertiesTest, ShortensTheValidityByANegativeTolerance) {
                         "The token has expired at: 2026-01-02T03:05:05.006Z");
 }
 
-TEST_F(CheckTokenPropertiesTest, AcceptsEveryValidityWithATolerancePastAllTime) {
+TEST_F(CheckTokenPropertiesTest, AcceptsEveryValidityWithAToleranceLongerThanAllTime) {
   SamlAssertionType assertion = HolderOfKey();
   for (const std::int64_t tolerance : {LARGEST, LARGEST / SECOND, LARGEST / SECOND + 1}) {
     assertion.Conditions.NotBefore = DateTime("0001-01-01T00:00:00Z");
@@ -148,14 +148,14 @@ TEST_F(CheckTokenPropertiesTest, AcceptsEveryValidityWithATolerancePastAllTime) 
   }
 }
 
-TEST_F(CheckTokenPropertiesTest, RefusesEveryValidityWithAToleranceBeforeAllTime) {
+TEST_F(CheckTokenPropertiesTest, RefusesEveryValidityWithANegativeToleranceLongerThanAllTime) {
   for (const std::int64_t tolerance : {SMALLEST, SMALLEST / SECOND, SMALLEST / SECOND - 1}) {
     EXPECT_THROWS_MESSAGE(CheckTokenProperties(ValidAssertion(), tolerance), ParseException,
                           "Token start date is in the future: 2026-01-02T02:04:05.006Z");
   }
 }
 
-// The dates themselves cannot leave the years 1 to 9999; the tolerance still counts there.
+// A date is always in the years 1 to 9999; with the tolerance, a validity may begin before them and end after them.
 TEST_F(CheckTokenPropertiesTest, AppliesTheToleranceBeyondTheFirstAndTheLastDate) {
   const DateTime first("0001-01-01T00:00:00Z");
   const DateTime last("9999-12-31T23:59:59.999999Z");
@@ -274,7 +274,7 @@ TEST_F(CheckTokenPropertiesTest, ReadsTheClockOnce) {
   EXPECT_EQ(looks, 1);
 }
 
-TEST_F(CheckTokenPropertiesTest, ReadsTheClockOnlyAfterVersionIdAndOrderOfTheDates) {
+TEST_F(CheckTokenPropertiesTest, ReadsTheClockOnlyAfterItHasCheckedVersionIdAndOrderOfDates) {
   int looks = 0;
   const Tarvel::ScopedEnvironment clock({[&looks] { return ++looks; }, {}});
   SamlAssertionType assertion = ValidBetween(0, 0);

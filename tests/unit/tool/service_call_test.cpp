@@ -20,7 +20,7 @@ TEST(AskForToken, ReturnsTheTokenOfTheCall) {
   EXPECT_EQ(token, AskForToken([&]() -> std::shared_ptr<const SamlToken> { return token; }, nullptr, OUTPUT).token);
 }
 
-TEST(AskForToken, RefusesAResponseThatHoldsNoToken) {
+TEST(AskForToken, RefusesAResponseWithoutAToken) {
   EXPECT_THROWS_MESSAGE(AskForToken([] { return nullptr; }, nullptr, OUTPUT), SsoException,
                         "The response holds no token");
 }
@@ -34,7 +34,7 @@ TEST(CallService, PassesOnFailuresThatAreNotAboutTheAnswer) {
                         "exhausted");
 }
 
-TEST(CallService, ReportsAnAnswerThatCannotBeReadAsAFaultOfTheService) {
+TEST(CallService, ReportsAnUnreadableAnswerAsAFaultOfTheService) {
   EXPECT_THROWS_MESSAGE(CallService([]() -> bool { throw ParseException("no element"); }), SsoException, "no element");
   EXPECT_THROWS_MESSAGE(CallService([]() -> bool { throw Tarvel::Xml::XMLParseException("no XML", 1, 2); }),
                         SsoException, "no XML at line 1, column 2");

@@ -23,7 +23,7 @@ TokenSpec SpecFor(std::int64_t lifetimeSec) {
   return spec;
 }
 
-/// A token that is valid for an hour from the moment when it was asked for.
+/// A token that is, by default, valid for an hour from the moment when it was asked for.
 TokenFacts HourFrom(const char *start = "2026-01-01T12:00:00Z", const char *end = "2026-01-01T13:00:00Z") {
   TokenFacts facts;
   facts.startDate = DateTime(start);
@@ -103,7 +103,7 @@ TEST(FindUnmet, ComparesTheLastDelegateWithoutLetterCase) {
               ElementsAre("delegation to Bob@CORP.example; the token is delegated to bob@other.example"));
 }
 
-TEST(FindUnmet, ComparesADelegateWithoutDomainByNameAlone) {
+TEST(FindUnmet, ComparesADelegateWithoutDomainOnlyByName) {
   TokenSpec spec = SpecFor(3600);
   spec.delegateTo = "bob";
   TokenFacts facts = HourFrom();
@@ -149,14 +149,14 @@ const Life LIVES[] = {
     {"ShorterByAlmostTwoSeconds", "2026-01-01T12:00:01.500Z", "2026-01-01T12:59:58.001Z", 0, true},
     {"ShorterByTwoSeconds", "2026-01-01T12:00:00Z", "2026-01-01T12:59:58Z", 0, false},
     {"ShorterByTwoSecondsWhateverTheTolerance", "2026-01-01T12:00:00Z", "2026-01-01T12:59:58Z", 600, false},
-    {"ClockOfTheServiceAheadReckonsByTheRequest", "2026-01-01T12:05:00Z", "2026-01-01T13:00:00Z", 0, true},
+    {"ClockOfTheServiceAheadAndEndAsRequested", "2026-01-01T12:05:00Z", "2026-01-01T13:00:00Z", 0, true},
     {"ClockOfTheServiceAhead", "2026-01-01T12:05:00Z", "2026-01-01T13:05:00Z", 0, true},
-    {"ClockOfTheServiceBehindReckonsByTheRequest", "2026-01-01T11:50:00Z", "2026-01-01T13:00:00Z", 0, true},
+    {"ClockOfTheServiceBehindAndEndAsRequested", "2026-01-01T11:50:00Z", "2026-01-01T13:00:00Z", 0, true},
     {"ClockOfTheServiceBehindWithinTheTolerance", "2026-01-01T11:50:00Z", "2026-01-01T12:50:00Z", 600, true},
     {"ClockOfTheServiceBehindByMoreThanTheTolerance", "2026-01-01T11:50:00Z", "2026-01-01T12:50:00Z", 598, false},
-    {"OldTokenOfTheSameSpan", "2026-01-01T11:30:00Z", "2026-01-01T12:30:00Z", 600, false},
-    {"LargeToleranceIsTenMinutes", "2026-01-01T11:30:00Z", "2026-01-01T12:30:00Z", 86400, false},
-    {"NegativeToleranceIsNone", "2026-01-01T11:59:59Z", "2026-01-01T12:59:59Z", -3600, true},
+    {"OldTokenOfTheSameLength", "2026-01-01T11:30:00Z", "2026-01-01T12:30:00Z", 600, false},
+    {"LargeToleranceCountsAsTenMinutes", "2026-01-01T11:30:00Z", "2026-01-01T12:30:00Z", 86400, false},
+    {"NegativeToleranceCountsAsZero", "2026-01-01T11:59:59Z", "2026-01-01T12:59:59Z", -3600, true},
     {"Minute", "2026-01-01T12:00:00Z", "2026-01-01T12:01:00Z", 600, false},
 };
 

@@ -51,7 +51,7 @@ TEST(MoveToChild, StopsAtProcessingInstruction) {
   EXPECT_EQ(nullptr, IteratorToElement(iterator));
 }
 
-TEST(MoveToChild, MovesPastTheEndWithoutChildren) {
+TEST(MoveToChild, MovesPastTheEndWhenThereAreNoChildren) {
   const ParsedDocument document("<r/>");
   NodeFilterIterator iterator = document.Cursor();
   EXPECT_EQ(nullptr, iterator.MoveToChild().node);

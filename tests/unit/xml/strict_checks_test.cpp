@@ -184,7 +184,7 @@ TEST(GetDateAttribute, ReadsADate) {
   EXPECT_EQ(DateTime("2013-05-07T09:03:01.042Z"), date);
 }
 
-TEST(GetDateAttribute, RefusesOtherTextsAndAbsence) {
+TEST(GetDateAttribute, RefusesOtherTextsAndAMissingAttribute) {
   for (const std::string text :
        {"<a:r xmlns:a='urn:a'/>", "<a:r xmlns:a='urn:a' At=''/>", "<a:r xmlns:a='urn:a' At='tomorrow'/>",
         "<a:r xmlns:a='urn:a' At='2013-05-07'/>", "<a:r xmlns:a='urn:a' At='2013-13-07T09:03:01Z'/>",
@@ -212,7 +212,7 @@ TEST(GetBoolAttribute, ReadsBothSpellingsInAnyLetterCase) {
   }
 }
 
-TEST(GetBoolAttribute, RefusesOtherTextsAndAbsence) {
+TEST(GetBoolAttribute, RefusesOtherTextsAndAMissingAttribute) {
   for (const std::string attributes :
        {"", "Flag=''", "Flag='yes'", "Flag='2'", "Flag=' true'", "Flag='01'", "flag='true'"}) {
     EXPECT_THROWS_MESSAGE(ReadFlag(attributes), ParseException, "r/@Flag is not a Boolean");

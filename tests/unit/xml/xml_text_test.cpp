@@ -72,7 +72,7 @@ TEST(GetText, IsEmptyForNull) {
   EXPECT_EQ("", GetText(nullptr));
 }
 
-TEST(CanonicalElementText, IsADocumentOfItsOwn) {
+TEST(CanonicalElementText, IsACompleteDocument) {
   const ParsedDocument document("<r xmlns='urn:r' xmlns:p='urn:p'><p:e b='2' a='1'><!-- note --><f/></p:e></r>");
   EXPECT_EQ("<p:e xmlns=\"urn:r\" xmlns:p=\"urn:p\" a=\"1\" b=\"2\"><f></f></p:e>",
             CanonicalElementText(document.Child("e")));
