@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// `ClientCredential`, which the client negotiates with.
+/// `ClientCredential`, with which the client negotiates.
 
 #pragma once
 
