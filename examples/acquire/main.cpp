@@ -54,7 +54,7 @@ std::shared_ptr<const SsoClient::SamlToken> Acquire(const Arguments &arguments) 
   SsoClient::SecurityTokenServiceConfig config;
   config.stsUrl = arguments.url;
   config.signingCertificates = Tarvel::Crypto::LoadCertificates(arguments.signers);
-  config.sslContext = tls.get(); // the service holds a reference of its own
+  config.sslContext = tls.get(); // the service takes its own reference
   const std::shared_ptr<const SsoClient::SecurityTokenService> service = SsoClient::CreateSecurityTokenService(config);
 
   SsoClient::TokenSpec spec;
@@ -67,7 +67,7 @@ std::shared_ptr<const SsoClient::SamlToken> Acquire(const Arguments &arguments) 
 void Print(const SsoClient::SamlToken &token) {
   std::cerr << "acquired " << token.GetId() << " for " << token.GetSubject().name << " of " << token.GetSubject().domain
             << ", valid until " << token.GetEndDate().ToString() << '\n';
-  // Anybody who has a bearer token can use it: protect it like a password, and never log it.
+  // A thief can use a bearer token, too: protect it like a password, and never log it.
   std::cout << token.ToXml() << std::flush;
 }
 

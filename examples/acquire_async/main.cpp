@@ -72,14 +72,14 @@ private:
   std::vector<Outcome> m_outcomes;
 };
 
-/// Starts one operation and returns at once. The library holds what the operation needs until it has ended: the
+/// Starts one operation and returns at once. The library keeps what the operation needs until it has ended: the
 /// service's state, copies of the texts (the password is wiped afterwards), and the completion.
 void Start(const SsoClient::SecurityTokenService &service, const std::string &user, const std::string &password,
            const std::shared_ptr<Outcomes> &outcomes) {
   SsoClient::TokenSpec spec;
   spec.tokenLifetimeSec = 8 * 60 * 60;
-  // Called once, with a token or an exception. The exception is valid only during this call; a clone lasts, and keeps
-  // its class.
+  // Called once, with a token or an exception. The exception is valid only during this call. A clone stays valid, and
+  // has the same class.
   const auto end = [user, outcomes](const std::shared_ptr<const SsoClient::SamlToken> &token,
                                     const Tarvel::Exception *failure) {
     std::shared_ptr<const Tarvel::Exception> kept(failure ? failure->Clone() : nullptr);
@@ -115,7 +115,7 @@ int Run(const SsoClient::SecurityTokenServiceConfig &config, const std::vector<s
       const Tarvel::SecretText password = ReadPassword(); // one line of standard input for each user
       Start(*service, user, password.Get(), outcomes);
     }
-  } // The service may be released while its operations run: each of them holds what it needs.
+  } // The service may be released while its operations run: each of them keeps what it needs.
 
   int exitCode = DONE;
   for (const Outcome &outcome : outcomes->WaitFor(users.size())) {
@@ -138,10 +138,10 @@ int main(int argc, char **argv) {
     SsoClient::SecurityTokenServiceConfig config;
     config.stsUrl = argv[1];
     config.signingCertificates = Tarvel::Crypto::LoadCertificates(argv[3]);
-    config.sslContext = tls.get(); // the service, and each operation, hold references of their own
+    config.sslContext = tls.get(); // the service and each operation take their own references
     return Run(config, {argv + 4, argv + argc});
   } catch (const std::exception &error) {
-    // A file, the address, or standard input. The failure of an operation is passed to its completion instead.
+    // A file, the address or standard input is wrong. The failure of an operation is passed to its completion instead.
     std::cerr << "failed: " << error.what() << '\n';
     return FAILED;
   }

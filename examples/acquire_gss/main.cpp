@@ -39,13 +39,13 @@ std::shared_ptr<const SsoClient::SamlToken> Acquire(const Arguments &arguments) 
   SsoClient::SecurityTokenServiceConfig config;
   config.stsUrl = arguments.url;
   config.signingCertificates = Tarvel::Crypto::LoadCertificates(arguments.signers);
-  config.sslContext = tls.get(); // the service holds a reference of its own
+  config.sslContext = tls.get(); // the service takes its own reference
   const std::shared_ptr<const SsoClient::SecurityTokenService> service = SsoClient::CreateSecurityTokenService(config);
 
   SsoClient::Gssapi::SpnegoSettings settings;
   settings.service = arguments.service;
   settings.clientKeytab = arguments.clientKeytab;
-  settings.timeLimitSec = 30; // for the whole negotiation; by itself the operation limits only each message
+  settings.timeLimitSec = 30; // for the whole negotiation; the operation itself only limits each message
 
   SsoClient::TokenSpec spec;
   spec.tokenLifetimeSec = 8 * 60 * 60; // a request; the token says what was granted
@@ -54,8 +54,8 @@ std::shared_ptr<const SsoClient::SamlToken> Acquire(const Arguments &arguments) 
   const std::shared_ptr<SsoClient::Gssapi::SpnegoHandler> handler = SsoClient::Gssapi::CreateSpnegoHandler(settings);
   auto token = service->AcquireTokenByGSS(spec, *handler);
 
-  // TLS and the token's signature have already authenticated the service. This line also requires that Kerberos has,
-  // and so refuses a service that leaves out its final leg. Remove it if you do not need that.
+  // TLS and the token's signature have already authenticated the service. This line also requires that Kerberos has
+  // done so. It refuses a service that leaves out its final leg. Remove it if you do not need that.
   handler->RequireMutualAuthentication();
   return token;
 }
@@ -81,7 +81,7 @@ int main(int argc, char **argv) {
     std::cerr << "refused: " << error.what() << '\n'; // the service refuses the ticket, or does not know its owner
     return REFUSED;
   } catch (const SsoClient::Gssapi::GssNegotiationException &error) {
-    std::cerr << "not negotiated: " << error.what() << '\n'; // the realm, a clock, or another service
+    std::cerr << "not negotiated: " << error.what() << '\n'; // check the realm, the clocks, and SERVICE
     return UNREACHABLE;
   } catch (const SsoClient::CommunicationException &error) {
     std::cerr << "unreachable: " << error.what() << '\n'; // try again later

@@ -1,7 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// Acquires a token leg by leg, for programs that run the GSS loop themselves because they cannot use the ready
-/// handler: for example, because another process makes the legs. Here the GSSAPI makes them, by SPNEGO.
+/// Acquires a token leg by leg, for programs that cannot use the ready handler, for example because another process
+/// makes the legs. Such a program runs the GSS loop itself. Here the GSSAPI makes the legs, by SPNEGO.
 ///
 /// Usage: kinit alice && negotiate https://sts.corp.example/STS/trust authority.pem sts.pem HTTP@sts.corp.example
 /// >token.xml
@@ -31,7 +31,7 @@ constexpr int MAX_LEGS = 10; // nothing else ends a negotiation with a service t
 
 using Leg = std::vector<std::uint8_t>;
 
-/// The GSSAPI's text for a status code, major or minor by `kind`.
+/// The GSSAPI's text for a status code. `kind` says whether the code is major or minor.
 std::string Describe(OM_uint32 code, int kind) {
   std::string all;
   OM_uint32 rest = 0;
@@ -109,7 +109,7 @@ std::shared_ptr<const SsoClient::SamlToken> Negotiate(SsoClient::InternalApi::Gs
     if (!result.token) {
       continue;
     }
-    // The last leg arrives with the token. Do not skip it: it holds the proof of the service's identity.
+    // The last leg arrives with the token. Do not skip it: it contains the proof of the service's identity.
     if (!serviceLeg.empty()) {
       client.Step(serviceLeg);
     }
@@ -129,7 +129,7 @@ std::shared_ptr<const SsoClient::SamlToken> Acquire(const char *url, const char 
   SsoClient::SecurityTokenServiceConfig config;
   config.stsUrl = url;
   config.signingCertificates = Tarvel::Crypto::LoadCertificates(signers);
-  config.sslContext = tls.get(); // the context holds a reference of its own
+  config.sslContext = tls.get(); // the context takes its own reference
   SsoClient::TokenSpec spec;
   spec.tokenLifetimeSec = 8 * 60 * 60;
 

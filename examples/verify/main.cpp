@@ -32,8 +32,8 @@ SsoClient::PrincipalId ParsePrincipal(const std::string &text) {
                                  : SsoClient::PrincipalId{text.substr(0, at), text.substr(at + 1)};
 }
 
-/// A token may be restricted to audiences. A service that accepts tokens meant for others lets those others act here as
-/// the token's subject.
+/// A token may be restricted to audiences. If this service accepted a token that is meant for another service, that
+/// service could act here as the token's subject.
 bool IsForUs(const SsoClient::SamlToken &token, const std::string &audience) {
   std::set<std::string> audiences;
   token.GetAudience(audiences);
@@ -79,7 +79,7 @@ int main(int argc, char **argv) {
 
   const std::string xml{std::istreambuf_iterator<char>(std::cin), {}};
   try {
-    // For each request from here on, on any number of threads at once.
+    // A service does this for each request, on any number of threads at once.
     const std::shared_ptr<const SsoClient::SamlToken> token = SsoClient::CreateSamlToken(xml, trusted);
     const std::string refusal = Judge(*token, argv[2], ParsePrincipal(argv[3]));
     if (!refusal.empty()) {

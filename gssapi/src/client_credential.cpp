@@ -76,7 +76,7 @@ ClientCredential::ClientCredential(const SpnegoSettings &settings) {
     ImportName(settings.client, GSS_KRB5_NT_PRINCIPAL_NAME, client);
   }
 
-  // For Kerberos first, since SPNEGO does not say why it finds no credential.
+  // The credential for Kerberos is acquired first, since SPNEGO does not say why it finds none.
   CredentialHandle kerberos;
   OM_uint32 lifetime = 0;
   RequireSuccess(Acquire(client.Get(), KerberosMechanism(), store, kerberos, lifetime), KerberosMechanism(), settings);

@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// `ClientCredential`, which the client negotiates with.
+/// `ClientCredential`, with which the client negotiates.
 
 #pragma once
 
@@ -24,7 +24,8 @@ public:
   gss_cred_id_t Get() const noexcept { return m_credential.Get(); }
 
 private:
-  std::unique_ptr<const MemoryCache> m_cache; // declared before its user, the credential; null when a cache is named
+  // Null unless the settings name a keytab and no cache. Declared before the credential, which uses it.
+  std::unique_ptr<const MemoryCache> m_cache;
   CredentialHandle m_credential;
 };
 

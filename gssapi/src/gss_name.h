@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// Names in the form that the GSSAPI uses: of principals, and of mechanisms.
+/// The names of principals and of mechanisms, in the form that the GSSAPI uses.
 
 #pragma once
 

@@ -41,7 +41,8 @@ XMLBuilderPtr CertRefSignedSoapBuilder(const XMLBuilderPtr &header, const XMLBui
                                        const Tarvel::Crypto::PrivateKey *privateKey,
                                        const Tarvel::Crypto::Certificate *certificate);
 
-/// A signed envelope whose signature refers to the SAML assertion with that identifier, which is in the header already.
+/// A signed envelope whose signature refers to the SAML assertion with that identifier. `header` must contain the
+/// assertion.
 /// @param privateKey not owned: it must live as long as the builder
 XMLBuilderPtr SamlRefSignedSoapBuilder(const XMLBuilderPtr &header, const XMLBuilderPtr &body,
                                        const Tarvel::Crypto::PrivateKey *privateKey, const std::string &assertionId);

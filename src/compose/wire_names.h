@@ -23,7 +23,7 @@ constexpr std::string_view SAML_ID = "http://docs.oasis-open.org/wss/oasis-wss-s
 /// The SPNEGO binary exchange uses the value type of WS-Trust of February 2005 on purpose.
 constexpr std::string_view SPNEGO = "http://schemas.xmlsoap.org/ws/2005/02/trust/spnego";
 
-/// The identifier of the binary security token that holds the client's certificate.
+/// The identifier of the binary security token that contains the client's certificate.
 constexpr std::string_view HOLDER_OF_KEY_CERTIFICATE_ID = "holderOfKeyCertificate";
 /// The identifier of the message signature, to which `wst:UseKey` refers.
 constexpr std::string_view HOLDER_OF_KEY_SIGNATURE_ID = "holderOfKeyProofSignature";

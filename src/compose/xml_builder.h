@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// Builders: small immutable descriptions of XML elements, of which all outgoing messages are composed.
+/// Builders: small immutable descriptions of XML elements. All outgoing messages are composed of them.
 
 #pragma once
 
@@ -15,11 +15,12 @@
 namespace SsoClient {
 
 /// Makes one element. Immutable once its factory has returned (a composite: once its last child has been added). From then on
-/// it may be shared by several trees and built on several threads at once.
+/// several threads may build it at once, and several trees may share it. The exception is a builder that contains a
+/// `PreBuiltElementImpl`: only one tree can have that element.
 class XMLBaseBuilder {
 public:
   /// Sets `out` to the element with its content.
-  /// @throws Tarvel::InvalidArgumentException for a text or attribute value that XML 1.0 cannot carry.
+  /// @throws Tarvel::InvalidArgumentException for a text or attribute value that XML 1.0 cannot represent.
   virtual void build(Tarvel::Ref<Tarvel::Xml::ElementNode> &out) const = 0;
 
 protected:
@@ -39,13 +40,13 @@ using XMLAttributes = std::map<std::string, std::string>;
 XMLBuilderPtr ElementBuilder(const std::string &prefix, const std::string &name, XMLAttributes attributes);
 XMLBuilderPtr ElementBuilder(const std::string &prefix, const std::string &name);
 
-/// An element whose only child is a text node, even if `text` is empty. `text` is not escaped. The builder's copy is wiped when
-/// the builder is destroyed, because it may be a password.
+/// An element whose only child is a text node, even if `text` is empty. Callers do not escape `text`. The builder's
+/// copy is wiped when the builder is destroyed, because it may be a password.
 XMLBuilderPtr TextElementBuilder(const std::string &prefix, const std::string &name, XMLAttributes attributes,
                                  const std::string &text);
 XMLBuilderPtr TextElementBuilder(const std::string &prefix, const std::string &name, const std::string &text);
 
-/// The element of another builder with further child elements after those that it has.
+/// The element of another builder, with further child elements after its own.
 class XMLCompositeBuilder final : public XMLBaseBuilder {
 public:
   explicit XMLCompositeBuilder(XMLBuilderPtr base);

@@ -32,7 +32,7 @@ public:
   virtual void BuildContinuedSPNegoRequest(const std::string &contextId, const std::vector<std::uint8_t> &leg,
                                            Request &request) const = 0;
 
-  /// An issue request authenticated by the holder-of-key certificate alone.
+  /// An issue request authenticated only by the holder-of-key certificate.
   virtual void BuildCertificateTokenRequest(const TokenSpec &spec, Request &request) const = 0;
 
   /// An issue request authenticated by an existing token.

@@ -23,7 +23,8 @@ public:
 
   /// Signed when there is an identity and the spec asks for a holder-of-key token that is not delegated. The request for a
   /// delegated token is not signed, although its body asks for holder-of-key.
-  /// @throws Tarvel::InvalidArgumentException for a lifetime that is not positive, and for a text that XML cannot carry.
+  /// @throws Tarvel::InvalidArgumentException for a lifetime that is not positive, and for a text that XML cannot
+  ///         represent.
   void BuildUserPassTokenRequest(const std::string &username, const std::string &password, const TokenSpec &spec,
                                  Request &request) const override;
 

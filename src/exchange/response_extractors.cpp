@@ -22,7 +22,7 @@ using Tarvel::Xml::ElementNode;
 using Tarvel::Xml::TextNode;
 
 constexpr const char *UNEXPECTED_FORMAT = "Unexpected XML format";
-// One of the established texts of this place, although no response is refused with it.
+// No response is refused with this text. It stays because it is one of the established texts.
 [[maybe_unused]] constexpr const char *UNKNOWN_FAULT_CODE = "Unknown fault code:";
 
 [[noreturn]] void ThrowUnexpectedFormat() {

@@ -18,14 +18,14 @@ namespace SsoClient {
 /// The assertion of an issue response, which is in a collection. Also throws what `CanonicalElementText` throws.
 std::string ExtractIssuedToken(const Tarvel::Xml::ElementNode &body);
 
-/// The assertion of a renew response, which is in no collection. Also throws what `CanonicalElementText` throws.
+/// The assertion of a renew response, which is not in a collection. Also throws what `CanonicalElementText` throws.
 std::string ExtractRenewedToken(const Tarvel::Xml::ElementNode &body);
 
 /// Whether a validate response says that the token is valid.
 bool ExtractValidationStatus(const Tarvel::Xml::ElementNode &body);
 
-/// One leg of a negotiation. The response to the final leg is in a collection and has the token; the responses before it
-/// are in no collection. Also throws what `CanonicalElementText` throws.
+/// One leg of a negotiation. The response to the final leg is in a collection and has the token; the earlier responses
+/// are not in a collection. Also throws what `CanonicalElementText` throws.
 SPNegoResponse ExtractSPNegoLeg(const Tarvel::Xml::ElementNode &body);
 
 } // namespace SsoClient

@@ -48,7 +48,7 @@ bool IsUtf8(std::string charset) {
   return charset == "utf-8" || charset == "utf8";
 }
 
-/// The declared charset unless it is UTF-8, because it may be the only thing that is wrong.
+/// The declared charset, unless it is UTF-8. The message shows it, because the charset may be all that is wrong.
 std::string DescribeCharset(const Tarvel::Reader &response) {
   const std::string charset = response.GetDeclaredCharset();
   return charset.empty() || IsUtf8(charset) ? "" : " (charset " + charset + ")";

@@ -13,7 +13,7 @@
 
 namespace SsoClient {
 
-/// The document element of the response. The reference holds the whole tree.
+/// The document element of the response. The reference keeps the whole tree alive.
 /// @throws SsoException when the response is not well-formed XML. The message ends with the charset that the response
 ///         declares, unless that is UTF-8.
 Tarvel::Ref<const Tarvel::Xml::ElementNode> ParseResponseDocument(Tarvel::Reader &response);

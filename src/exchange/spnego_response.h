@@ -10,7 +10,7 @@
 
 namespace SsoClient {
 
-/// All legs of a negotiation use the same record.
+/// The responses to all legs of a negotiation have this form.
 struct SPNegoResponse {
   std::string contextId;         ///< the negotiation's identifier; empty until the service returns one
   std::vector<std::uint8_t> leg; ///< the service's GSS output token of this leg; empty when it sent none

@@ -12,8 +12,8 @@ namespace SsoClient {
 using Tarvel::DatePrintFormatter;
 using Tarvel::MessageFormatter;
 
-// Programs read the texts below: their missing blanks and brackets, and the label "source" before the name of an attribute,
-// must stay as they are.
+// Programs read the texts below, so their oddities must stay: missing blanks and brackets, and the label "source"
+// before the name of an attribute.
 
 std::string WriteDelegate(const Delegate *delegate) {
   return delegate->subject.ToString() + " at " + delegate->delegationInstant.ToString();

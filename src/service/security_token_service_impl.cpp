@@ -34,10 +34,10 @@ void LogRequestedSpec(const TokenSpec &spec) {
   }
 }
 
-/// The token is issued already. The handler only sees the last leg of the service.
+/// The token has already been issued. The handler only processes the service's last leg.
 void HandOverFinalLeg(NegotiationHandler &handler, const std::vector<std::uint8_t> &serviceLeg) {
   const std::shared_ptr<std::vector<std::uint8_t>> userLeg = handler.NegotiateLeg(serviceLeg);
-  // The condition is inverted on purpose: a handler that answers the final leg is not logged, one that does not is.
+  // The condition is inverted on purpose: the line is logged when the handler does not answer, and not when it does.
   if (!userLeg || userLeg->empty()) {
     LogInternal(getLogger(), LOG_LEVEL_CONTRACT_WARNING,
                 "GSS contract error: non-empty user leg after negotiation is complete");

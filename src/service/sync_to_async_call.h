@@ -33,8 +33,8 @@ private:
 };
 
 /// Runs `call`, then `callback` with the result and null, or with `failureValue` and the exception, which is valid during the
-/// callback only. What `callback` throws leaves this function. So does an exception of `call` that is not a
-/// `Tarvel::Exception`; `callback` is then not called.
+/// callback only. What `callback` throws leaves this function. An exception of `call` that is not a
+/// `Tarvel::Exception` leaves it, too; `callback` is then not called.
 template <typename Call, typename Callback, typename FailureValue>
 void SyncCallToResultFunc(const Call &call, const Callback &callback, const FailureValue &failureValue) {
   FailureValue result = failureValue;
@@ -48,8 +48,8 @@ void SyncCallToResultFunc(const Call &call, const Callback &callback, const Fail
   callback(result, nullptr);
 }
 
-/// Queues `SyncCallToResultFunc` of copies of the three on the platform's thread pool and returns at once. The copies are
-/// destroyed when the work has run.
+/// Copies the arguments, queues `SyncCallToResultFunc` with the copies on the platform's thread pool, and returns at
+/// once. The copies are destroyed when the work has run.
 /// @throws Tarvel::InvalidStateException when the pool has no thread and cannot start one. Nothing is called then.
 template <typename Call, typename Callback, typename FailureValue>
 void SyncToAsyncCall(const Call &call, const Callback &callback, const FailureValue &failureValue) {

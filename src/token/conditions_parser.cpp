@@ -132,7 +132,7 @@ bool TryParseRenewRestriction(NodeFilterIterator &iterator, boost::optional<Rene
                                  {LocalName("Count"), LocalName("Postdatable"), LocalName("RenewExpired")});
   restriction.emplace();
   GetULongOptionalAttribute(*element, "Count", restriction->Count);
-  // Content would be signed, but ignored.
+  // Content is refused, because it would be signed and still ignored.
   RequireEmptyElement(iterator);
   iterator.MoveToSibling();
   return true;

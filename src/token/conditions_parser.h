@@ -2,7 +2,8 @@
 /// @file
 /// Readers of the conditions under which a token is valid.
 ///
-/// A `TryParse` function returns whether its element was at the cursor. If not, it does not change cursor or record.
+/// A `TryParse` function returns whether its element was at the cursor. If not, the cursor and the record stay
+/// unchanged.
 
 #pragma once
 

@@ -37,7 +37,8 @@ SamlTokenImpl::SamlTokenImpl(const ElementNode &element, const KeyInfoResolver &
 
 void SamlTokenImpl::InitializeFromDom(const ElementNode *element, const KeyInfoResolver &resolver,
                                       std::int64_t clockToleranceSec) {
-  // The filter outlives all cursors, so the shared pointer owns nothing: a count would cost two atomic operations per cursor.
+  // The filter outlives all cursors, so the shared pointer owns nothing: counting references would cost two atomic
+  // operations per cursor.
   const SkipWsAndCommentsFilter filter;
   NodeFilterIterator iterator(element, std::shared_ptr<const NodeFilter>(std::shared_ptr<void>(), &filter));
   SamlAssertionType assertion;

@@ -12,16 +12,16 @@
 
 namespace SsoClient {
 
-/// A token that is complete: its constructors parse, check and verify, or throw as `CreateSamlToken` says. It is made by
-/// `std::make_shared<SamlTokenImpl>`: the shared pointer then destroys it as what it is, although the interface has no virtual
-/// destructor.
+/// A complete token: its constructors parse, check and verify, or throw as `CreateSamlToken` says. Make it by
+/// `std::make_shared<SamlTokenImpl>`. The shared pointer then calls the destructor of this class, although the
+/// interface has no virtual destructor.
 class SamlTokenImpl final : public SamlToken {
 public:
   /// From a text, which `ToXml` returns unchanged.
   SamlTokenImpl(const std::string &xml, const Tarvel::Xml::Security::KeyInfoResolver &resolver,
                 std::int64_t clockToleranceSec);
 
-  /// From an element, of which `ToXml` returns the canonical form.
+  /// From an element. `ToXml` returns its canonical form.
   SamlTokenImpl(const Tarvel::Xml::ElementNode &element, const Tarvel::Xml::Security::KeyInfoResolver &resolver,
                 std::int64_t clockToleranceSec);
 

@@ -25,8 +25,9 @@ void ParseAttributeValue(NodeFilterIterator &iterator, std::string &value) {
   iterator.MoveToSibling();
 }
 
-/// An upper limit of the number of attributes: each element with at least one XML attribute is counted. It is reserved at
-/// once, because a sequence that grows step by step needs up to three times the memory.
+/// An upper limit of the number of SAML attributes: it counts each element with at least one XML attribute. The caller
+/// reserves memory for all of them at once, because a sequence that grows step by step needs up to three times the
+/// memory.
 std::size_t CountPossibleAttributes(const ElementNode &statement) {
   std::size_t count = 0;
   for (const Tarvel::Xml::Node *child = statement.GetFirstChild(); child; child = child->GetNextSibling()) {

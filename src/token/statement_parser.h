@@ -11,7 +11,7 @@
 
 namespace SsoClient {
 
-/// Reads a `saml:Advice`. Returns whether one was at the cursor. If not, it does not change cursor or record.
+/// Reads a `saml:Advice`. Returns whether one was at the cursor. If not, the cursor and the record stay unchanged.
 bool TryParseAdviceElement(NodeFilterIterator &iterator, boost::optional<AdviceType> &advice);
 
 /// Reads an `RSAAdvice`, the advice of one source.

@@ -23,7 +23,7 @@ void CheckValidity(const ConditionsType &conditions, std::int64_t clockTolerance
   if (!(conditions.NotBefore < conditions.NotOnOrAfter)) {
     throw ParseException("Unsatisfiable token validity conditions: NotBefore must be less than NotOnOrAfter.");
   }
-  // Differences of dates, not shifted dates: those would stop at the years 1 and 9999.
+  // Compares differences of dates. It does not shift dates, because a shifted date cannot leave the years 1 to 9999.
   const std::int64_t tolerance = Tarvel::System::SecondsToMicroseconds(clockToleranceSec);
   const Tarvel::System::DateTime now = Tarvel::System::GetUtcDateTime();
   if (conditions.NotBefore.MicrosecondsSince(now) > tolerance) {

@@ -43,7 +43,7 @@ struct TokenFacts {
 /// @throws ParseException when a name, a group or the solution attribute is malformed.
 TokenFacts TakeTokenFacts(SamlAssertionType &&assertion);
 
-/// Whether `attribute` is one of those that the token uses, by its `Name`.
+/// Each returns whether `attribute` is the one of that kind, by its `Name`. The token uses no other attributes.
 bool SamlAttributeIsGroupIdentity(const AttributeType &attribute);
 bool SamlAttributeIsSolution(const AttributeType &attribute);
 bool SamlAttributeIsGivenName(const AttributeType &attribute);
@@ -54,10 +54,10 @@ bool SamlAttributeIsSurName(const AttributeType &attribute);
 PrincipalId ParseGroupIdentity(std::string value);
 
 /// The principal in the form `name@domain`. The last at-sign is the separator.
-/// @throws ParseException when the format is not the user principal name, or name or domain is missing.
+/// @throws ParseException when the format is not that of a user principal name, or when name or domain is missing.
 PrincipalId ParseSamlNameId(const NameIDType &nameId);
 
-/// Whether the attribute's one value is "true", in any letter case.
+/// Whether the attribute's only value is "true", in any letter case.
 /// @throws ParseException when it has no value or several.
 bool ParseIsSolutionAttribute(const AttributeType &attribute);
 

@@ -45,7 +45,8 @@ void StartHandshake(const TlsLayer &layer, const Ref<Stream> &socket,
   throw Tarvel::InvalidStateException("The connection to " + endpoint + " failed: " + text);
 }
 
-/// The same, but throws only `Tarvel::Exception` and `std::bad_alloc`: it replaces exceptions of other classes.
+/// Like `StartHandshake`, but throws only `Tarvel::Exception` and `std::bad_alloc`: exceptions of other classes are
+/// replaced.
 void StartHandshakeOrThrowOurs(const TlsLayer &layer, const Ref<Stream> &socket,
                                const ConnectionSpec::ConnectCompletion &completion) {
   try {

@@ -49,7 +49,7 @@ void TranslateResponse(const Tarvel::Exception *exception, const Tarvel::Ref<Tar
                        std::shared_ptr<const Tarvel::Exception> &error, Tarvel::Ref<Tarvel::Reader> &body);
 
 /// Calls `completion` once, with the error and null or with null and the body of the response. The error is a
-/// `Tarvel::OutOfMemoryException` when memory runs out here. `pending` is not used; completions of the user agent have it.
+/// `Tarvel::OutOfMemoryException` when memory runs out here. `pending` is not used; the user agent passes it.
 void AsyncTranslateResponse(const TransportSession::Completion &completion, const Tarvel::Exception *exception,
                             const Tarvel::Ref<Tarvel::Http::ClientResponse> &response,
                             const Tarvel::Ref<Tarvel::Http::PendingRequestItem> &pending);

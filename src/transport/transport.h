@@ -48,7 +48,7 @@ protected:
 /// Opens conversations with one service. Safe on any thread.
 class Transport {
 public:
-  /// A new session, of which the caller has the only reference.
+  /// A new session. The caller has the only reference to it.
   virtual std::shared_ptr<TransportSession> CreateSession() const = 0;
 
 protected:

@@ -23,7 +23,7 @@ void AppendPadded(std::string &text, int number, std::size_t width) {
 } // namespace
 
 DateTime AddMinutesToDate(const DateTime &date, int minutes) {
-  // The product has 32 bits on purpose and wraps above 35 minutes. It is unsigned because wrapping is defined there only.
+  // The product has 32 bits on purpose and wraps above 35 minutes. It is unsigned because signed numbers must not wrap.
   const std::uint32_t product = static_cast<std::uint32_t>(minutes) * MICROSECONDS_PER_MINUTE;
   const std::int64_t offset = static_cast<std::int32_t>(product);
   return Tarvel::System::DateTimeFromUtc(date.GetUtcTime() + offset, false);

@@ -10,10 +10,11 @@
 
 namespace SsoClient {
 
-/// Decides at which nodes a cursor stops. Immutable, so any number of threads may use it. Held by a shared pointer that is
-/// made from the concrete type, or that owns nothing when the filter outlives the cursors.
+/// Decides at which nodes a cursor stops. Immutable, so any number of threads may use it. A shared pointer to a filter
+/// must be made from the concrete class, because the destructor is protected. The pointer may own nothing when the
+/// filter outlives the cursors.
 ///
-/// The library has one filter and needs no second. The interface is kept because it is part of the established form of cursors.
+/// The library has only one filter. The interface stays because the established form of cursors includes it.
 class NodeFilter {
 public:
   virtual bool Accept(const Tarvel::Xml::Node &node) const = 0;
@@ -44,7 +45,7 @@ public:
   /// Moves to the first visible child, or past the end.
   NodeFilterIterator &MoveToChild();
 
-  /// A cursor at the first visible child.
+  /// A cursor at the first visible child, or past the end.
   NodeFilterIterator GetChild() const;
 
   const Tarvel::Xml::Node *node; ///< the node at the cursor; null past the end

@@ -48,7 +48,8 @@ QNameView ResolveQName(const Tarvel::Xml::ElementNode &element, std::string_view
 void ResolveQName(const Tarvel::Xml::ElementNode &element, std::string_view text, std::string_view defaultNamespace,
                   Tarvel::Xml::QName &name);
 
-/// Whether `element` is not null, has that local name, and has a prefix that is bound to that namespace.
+/// Whether `element` is not null, has that local name, and is in that namespace. An element without a
+/// prefix is in the default namespace.
 bool ElementQNameIs(const Tarvel::Xml::ElementNode *element, std::string_view localName,
                     std::string_view namespaceUri) noexcept;
 

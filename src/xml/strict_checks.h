@@ -1,9 +1,10 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// The checks with which the assertion parser refuses all that it does not know.
+/// The checks by which the assertion parser refuses everything that it does not know.
 ///
-/// Each throws a `ParseException` with the name of the element, and does not change its arguments then. Checks of content use
-/// the cursor, so they ignore comments, and white space between nodes.
+/// A check that fails throws a `ParseException` and does not change its arguments. The message names the element,
+/// unless the caller gives the message. Checks of content use the cursor, so they ignore comments and white space
+/// between nodes.
 
 #pragma once
 
@@ -46,7 +47,8 @@ void RequireElementAttributesQNames(const Tarvel::Xml::ElementNode &element, std
                                     std::initializer_list<QNameView> optional);
 
 /// The element at the cursor must contain one text and nothing else. Two texts with a comment between them are refused, so
-/// that a comment cannot cut off a part of a value. It can only cut off white space at either end, which is not a text here.
+/// that a comment cannot cut off a part of a value. White space at either end is the exception: if a comment separates
+/// it from the rest, the cursor does not show it.
 void RequireTextualContent(NodeFilterIterator iterator, std::string &text);
 
 /// The value of an attribute without a prefix; empty when there is no such attribute.

@@ -14,7 +14,7 @@ namespace {
 using Tarvel::Ref;
 using Tarvel::Xml::Document;
 
-// The published URI has no "#" at its end. The canonicalizer knows this spelling as the same algorithm.
+// The published URI has no "#" at its end. The canonicalizer accepts this spelling for the same algorithm.
 constexpr const char *CANONICAL_XML = "http://www.w3.org/TR/2001/REC-xml-c14n-20010315#";
 
 } // namespace

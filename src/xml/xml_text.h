@@ -20,8 +20,8 @@ void ParseXML(Tarvel::Reader &reader, Tarvel::Ref<Tarvel::Xml::Document> &docume
 /// The same for a text.
 void ParseXML(const std::string &text, Tarvel::Ref<Tarvel::Xml::Document> &document);
 
-/// The first child of `node` if that is a text. Null for a null node, for a node without children, and when anything
-/// else, even a comment, comes first.
+/// The first child of `node` if that is a text. Null for a null node, for a node without children, and when the
+/// first child is anything else, even a comment.
 const Tarvel::Xml::TextNode *GetTextNode(const Tarvel::Xml::Node *node) noexcept;
 
 /// The value of `textNode`; empty for null.

@@ -31,7 +31,7 @@ std::string FolderOf(const std::string &path) {
   return slash == std::string::npos ? "." : path.substr(0, slash + 1);
 }
 
-/// A new file in a folder, which is deleted unless it is published under its final name.
+/// A new file in the folder of the final one. It is deleted unless it is published under the final name.
 class TemporaryFile {
 public:
   explicit TemporaryFile(const std::string &finalPath)
@@ -70,7 +70,7 @@ public:
     m_isPublished = true;
   }
 
-  // Unlike a renamed file, a link never replaces a file that has been created in the meantime.
+  // Makes a hard link, because renaming would replace a file that has been created in the meantime.
   void PublishAsNew() {
     if (link(m_path.c_str(), m_finalPath.c_str()) == 0) {
       return;
@@ -93,7 +93,7 @@ private:
 void RequireWritableFile(const std::string &path, bool replace) {
   struct stat status = {};
   if (lstat(path.c_str(), &status) == 0) {
-    // A caller does not mean to replace a device, or the target of a symbolic link, with a token.
+    // A caller does not mean to replace a device or a symbolic link with a token.
     if (!S_ISREG(status.st_mode)) {
       throw Tarvel::IOException(path + ": is not a regular file");
     }

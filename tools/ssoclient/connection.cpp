@@ -102,7 +102,7 @@ std::shared_ptr<SecurityTokenService> CreateService(const ConnectionOptions &opt
     }
   }
   config.sslContext = context.get();         // null for plain http
-  return CreateSecurityTokenService(config); // which takes a reference of its own to the context
+  return CreateSecurityTokenService(config); // takes its own reference to the context
 }
 
 } // namespace SsoClient::Tool

@@ -42,7 +42,7 @@ void CheckExchange(const TokenSpec &, bool hasIdentity) {
 
 IssuedToken AcquireByToken(const AcquireCall &call) {
   const auto given = ReadToken(call.credentials.tokenFile, call.trusted, call.toleranceSec);
-  // The signature of the request refers to the token for its key, and a bearer token has no key.
+  // The request's signature refers to the token, from which the service takes the key. A bearer token has no key.
   const Doubt *const doubt = given->GetConfirmationMethod() == SamlToken::BEARER ? &EXCHANGE_OF_BEARER_TOKEN : nullptr;
   return AskForToken([&] { return call.service.AcquireTokenByToken(*given, call.spec); }, doubt, call.output);
 }

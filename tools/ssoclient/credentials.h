@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// The kinds of credentials that a token can be acquired by.
+/// The kinds of credentials by which a token can be acquired.
 
 #pragma once
 

@@ -72,7 +72,8 @@ constexpr Row TABLE[] = {
     {IsA<Tarvel::Crypto::KeyMismatchException>, {ExitCode::FILE_OR_KEY, "KeyMismatchException", "key"}},
     {IsA<Tarvel::Crypto::CryptoException>, {ExitCode::FILE_OR_KEY, "CryptoException", "key or certificate"}},
     {IsA<SsoException>, {ExitCode::SERVICE_FAULT, "SsoException", "service fault"}},
-    // Every argument of the library is from the command line, such as an address, or a name that XML cannot represent.
+    // All arguments of the library are from the command line, for example an address, or a name that XML cannot
+    // represent.
     {IsA<Tarvel::Http::MalformedURLException>, {ExitCode::USAGE, "MalformedURLException", "usage"}},
     {IsA<Tarvel::InvalidArgumentException>, {ExitCode::USAGE, "InvalidArgumentException", "usage"}},
     {IsA<Tarvel::OutOfMemoryException>, {ExitCode::UNEXPECTED, "OutOfMemoryException", "out of memory"}},

@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// The exit codes of the tool, and which failure has which.
+/// The exit codes of the tool, and the exit code of each failure.
 
 #pragma once
 
@@ -43,7 +43,7 @@ struct Failure {
 /// Looks `failure` up in the one table of failures.
 Failure Classify(const std::exception &failure) noexcept;
 
-/// A failure together with a hint: what the caller may do about it. It is reported as that failure is.
+/// A failure together with a hint: what the caller may do about it. It is reported as that failure.
 class HintedException : public std::runtime_error {
 public:
   HintedException(const std::exception &failure, const std::string &hint)

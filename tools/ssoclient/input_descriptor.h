@@ -29,7 +29,8 @@ private:
 /// Records which option reads which of the descriptors that the process was started with.
 class InputClaims {
 public:
-  /// `option` reads the file `path`; only "-" is a claim. @throws UsageException when another option reads it too.
+  /// `option` reads the file `path`. Only "-", standard input, is recorded: files may be read twice.
+  /// @throws UsageException when another option reads standard input too.
   void ClaimFile(const std::string &path, const std::string &option);
   /// `option` reads `descriptor`, unless that is negative. @throws UsageException when another option reads it too.
   void ClaimDescriptor(int descriptor, const std::string &option);

@@ -12,7 +12,7 @@ namespace {
 
 constexpr int ENDING_SIGNALS[] = {SIGINT, SIGTERM, SIGHUP, SIGQUIT};
 
-// What the handler restores. It runs only on the main thread, which changes these variables with signals blocked.
+// What the handler restores. The handler runs only on the main thread, which blocks signals while it changes these.
 volatile std::sig_atomic_t g_isQuiet = 0;
 int g_terminal = -1;
 termios g_earlierSettings;

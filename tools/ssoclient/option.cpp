@@ -28,7 +28,7 @@ std::string NormaliseNumber(std::string &argument) {
   return {};
 }
 
-/// Accepts the "true" that the parser stores for a flag, and refuses any text that follows the flag after "=".
+/// Accepts the "true" that the parser stores for a flag, and refuses any other text that follows the flag after "=".
 std::string RefuseArgument(const std::string &argument) {
   return argument == "true" ? "" : "takes no argument";
 }

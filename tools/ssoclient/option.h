@@ -26,7 +26,7 @@ public:
   Option Required() const;
   /// The name of the option's argument in the help.
   Option TypeName(const std::string &name) const;
-  /// The heading that the help lists the option under.
+  /// The heading under which the help lists the option.
   Option Group(const std::string &name) const;
   /// The help shows the variable's current value as the default.
   Option ShowDefault() const;

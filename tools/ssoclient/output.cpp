@@ -61,7 +61,7 @@ Decoded DecodeFirst(std::string_view text) {
 }
 
 std::string Json(const nlohmann::ordered_json &value) {
-  // A file name may not be UTF-8; the message must be JSON all the same.
+  // A file name is not always UTF-8, but the message must still be JSON.
   return value.dump(-1, ' ', true, nlohmann::json::error_handler_t::replace);
 }
 

@@ -38,7 +38,7 @@ void WriteOutput(std::string_view text);
 void Warn(std::string_view message);
 
 /// The same for warnings that a failure may follow. When the format is JSON, only a verbose command writes them:
-/// programs expect standard error to hold the failure's object and nothing else.
+/// programs expect only the failure's object on standard error.
 void Warn(std::string_view message, const OutputOptions &output);
 
 /// From now on each line that the library logs is written to standard error.

@@ -26,7 +26,7 @@ constexpr std::size_t MAX_SECRET_BYTES = 4096;
   throw Tarvel::IOException(place + ": " + reason);
 }
 
-/// Reads octet by octet: what follows the line is left to be read by others, and no buffer keeps a copy of the secret.
+/// Reads octet by octet: what follows the line stays for the next reader, and no buffer keeps a copy of the secret.
 /// @throws Tarvel::IOException naming `place`.
 Tarvel::SecretText ReadLine(int descriptor, const std::string &place, const std::string &secretName) {
   Tarvel::SecretText secret;

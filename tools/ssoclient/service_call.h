@@ -39,7 +39,7 @@ auto CallService(const Call &call) {
   }
 }
 
-/// Why known services refuse a certain request. The request is sent all the same, since the service decides.
+/// Why known services refuse a certain request. The request is still sent, since the service decides.
 struct Doubt {
   const char *warning;
   const char *hint; ///< what to do when the service has refused the request

@@ -38,7 +38,7 @@ Json AdviceJson(const Advice &advice) {
   return {{"source", advice.source}, {"attributes", std::move(attributes)}};
 }
 
-// Long because callers rely on the keys and their order, which are therefore listed in one place. A change to either needs a
+// Long because it lists all keys in one place: callers rely on the keys and their order, and a change to either needs a
 // new "schema".
 std::string RenderJson(const TokenReport &report) {
   const TokenFacts &facts = report.facts;

@@ -78,15 +78,15 @@ void AddLifetimeOption(CLI::App &app, std::string &lifetime) {
 
 void AddTokenSpecOptions(CLI::App &app, TokenSpecOptions &options) {
   AddLifetimeOption(app, options.lifetime);
-  AddOption(app, "--audience", options.audience, "Who may accept the token; may be repeated")
+  AddOption(app, "--audience", options.audience, "Service that may accept the token; may be repeated")
       .TypeName("URI")
       .Group(GROUP);
-  AddOption(app, "--delegate-to", options.delegateTo, "Who may act for the subject with the token")
+  AddOption(app, "--delegate-to", options.delegateTo, "Principal that may act for the subject with the token")
       .TypeName("NAME")
       .Group(GROUP);
   AddFlag(app, "--delegable", options.delegable, "Ask for a token that may be delegated").Group(GROUP);
   AddFlag(app, "--renewable", options.renewable, "Ask for a token that may be renewed").Group(GROUP);
-  AddFlag(app, "--bearer", options.bearer, "Ask for a bearer token, which needs no key, although there is an identity")
+  AddFlag(app, "--bearer", options.bearer, "Even with an identity, ask for a bearer token, which needs no key")
       .Group(GROUP);
   AddOption(app, "--advice", options.advice,
             "Advice to put into the token; may be repeated; put a backslash before a colon that is part of NAME")

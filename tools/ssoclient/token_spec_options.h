@@ -34,11 +34,12 @@ void AddLifetimeOption(CLI::App &app, std::string &lifetime);
 void AddTokenSpecOptions(CLI::App &app, TokenSpecOptions &options);
 
 /// The seconds of a text such as "8h": a number, followed by s, m, h or d; without a unit, seconds.
-/// @throws UsageException for any other text, an empty one included, and for more than a hundred years.
+/// @throws UsageException for any other text, an empty one included, for zero or less, and for more than a hundred
+///         years.
 std::int64_t ParseLifetime(std::string_view text);
 
 /// The advice in texts of the form SOURCE:NAME=VALUE. NAME begins after the last colon before the first "="; a
-/// backslash removes any such meaning from the character after it. Values of one name, and names of one source, are put
+/// backslash makes the character after it an ordinary one. Values of one name, and names of one source, are put
 /// together in their order.
 /// @throws UsageException for a text of another form.
 std::vector<Advice> ParseAdvice(const std::vector<std::string> &texts);

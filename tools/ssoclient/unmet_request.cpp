@@ -11,7 +11,7 @@ namespace {
 
 using Tarvel::System::MICROSECONDS_PER_SECOND;
 
-// A service may round both dates of a token to whole seconds, each time so that the token is valid for less time.
+// A service may round both dates of a token to whole seconds, and each rounding may shorten the time of validity.
 constexpr std::int64_t ROUNDING_SEC = 2;
 
 template <typename Texts>
