@@ -46,16 +46,16 @@ public:
   ServerConnection &operator=(const ServerConnection &) = delete;
   ~ServerConnection();
 
-  /// Performs the handshake if the server has TLS; whether it succeeded. A script calls this first, unless it disturbs
-  /// the handshake.
+  /// Performs the handshake if the server has TLS, and returns whether it succeeded. A script calls this first, unless
+  /// it disturbs the handshake.
   bool Handshake();
 
   /// At most `limit` bytes; empty when the peer has ended the connection in any way.
   std::string ReadSome(std::size_t limit = 65536);
   /// Exactly `length` bytes, or fewer when the peer ends the connection.
   std::string ReadExactly(std::size_t length);
-  /// The bytes up to the first `delimiter`, with it, or all bytes when the peer ends the connection before. The next
-  /// read continues there.
+  /// The bytes up to and including the first `delimiter`, or all bytes if the peer ends the connection before it. The
+  /// next read continues there.
   std::string ReadUntil(std::string_view delimiter);
   /// One HTTP/1.1 request: its header, and the body that its Content-Length announces.
   std::string ReadRequest();
