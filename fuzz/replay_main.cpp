@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// Runs a fuzz target once on each file that its arguments name, or that is below a folder that they name.
+/// Runs a fuzz target once on each file that is an argument, or is below a folder that is an argument.
 
 #include <cstddef>
 #include <cstdint>

@@ -2,9 +2,9 @@
 # What Doxygen reads of a page: the same lines, changed where Doxygen's Markdown differs from that of code hosts.
 # - Doxygen ends a code span at an apostrophe, unless two backticks begin and end the span.
 # - Doxygen reads "@name" as a command.
-# - The identifier of a page is its path; that of a heading is the page's, followed by the one that code hosts give the heading.
-#   Links use these identifiers.
-# - A link to what is not part of the reference leads from build/docs/html into the project's folder.
+# - The identifier of a page is its path. The identifier of a heading is the page's, followed by the one that code hosts give the
+#   heading. Links use these identifiers.
+# - A link to a file that is not part of the reference becomes a path from build/docs/html to that file.
 
 BEGIN {
   page = ARGV[1]

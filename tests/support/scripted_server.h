@@ -106,7 +106,7 @@ private:
 
 class ScriptedServer {
 public:
-  /// Runs once for each connection, several at once; the connection ends when it returns.
+  /// Runs for each connection, for several at the same time. The connection ends when the script returns.
   using Script = std::function<void(ServerConnection &)>;
 
   /// Listens on a free port of 127.0.0.1, or of ::1.
