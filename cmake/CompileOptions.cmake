@@ -1,5 +1,6 @@
 # SPDX-License-Identifier: Apache-2.0
-# How our own code is compiled. Warnings are errors in our builds; a packager with a newer compiler turns SSOCLIENT_WERROR off.
+# How our own code is compiled. Warnings are errors in our builds; with a newer compiler, a packager can turn SSOCLIENT_WERROR
+# off.
 
 option(SSOCLIENT_WERROR "Treat warnings as errors" ${PROJECT_IS_TOP_LEVEL})
 

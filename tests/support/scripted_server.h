@@ -1,7 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// A TCP or TLS server on loopback inside the test process, with a script for every step. It uses only sockets and
-/// OpenSSL, so that it shares no code with the library that it tests.
+/// A TCP or TLS server on loopback inside the test process. A script controls each connection. The server uses only
+/// sockets and OpenSSL, so that it shares no code with the library that it tests.
 
 #pragma once
 

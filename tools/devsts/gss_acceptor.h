@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// The service's side of a SPNEGO negotiation, by the system's GSSAPI.
+/// The service's side of a SPNEGO negotiation, through the system's GSSAPI.
 
 #pragma once
 
