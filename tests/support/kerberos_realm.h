@@ -22,7 +22,8 @@ struct RealmSettings {
 
 /// Needs no root privileges and does not change the machine's configuration: as long as it exists, KRB5_CONFIG of this
 /// process is the realm's configuration, and the other variables of Kerberos are unset. So it must be made before the
-/// test starts threads, and only one may exist at a time. The centre ends with this object, and also when this process is killed.
+/// test starts threads, and only one may exist at a time. The centre ends with this object, and also when this
+/// process is killed.
 ///
 /// Principals are given without their realm. Files of the realm's folder are given in Kerberos's form, "FILE:…".
 class KerberosRealm {
