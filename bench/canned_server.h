@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// A minimal server: it completes the handshake, reads a request and sends always the same answer.
+/// A minimal server: it completes the handshake, reads a request, and always sends the same answer.
 
 #pragma once
 
@@ -11,15 +11,15 @@
 
 namespace Bench {
 
-/// Serves loopback over TLS, inside the measuring process. When two clients are compared, the server's share is in both
-/// figures.
+/// Serves loopback over TLS, inside the measuring process. When two clients are compared, both figures include the
+/// server's work.
 class CannedServer {
 public:
   /// The authority that a client must trust.
   static const std::string AUTHORITY_FILE;
 
   /// @param body of the answer, of the type text/xml.
-  /// @param resumesSessions whether connections after a client's first need no full handshake.
+  /// @param resumesSessions whether a client's connections after its first need no full handshake.
   CannedServer(const std::string &body, bool resumesSessions);
 
   const std::string &GetUrl() const { return m_url; }

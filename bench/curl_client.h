@@ -16,7 +16,7 @@ namespace Bench {
 /// limits as our client. For one thread at a time.
 class CurlClient {
 public:
-  /// @param authorityFile PEM certificates that the server's must chain to.
+  /// @param authorityFile PEM certificates of authorities; the server's certificate must chain to one of them.
   /// @param soapAction without quotes.
   CurlClient(const std::string &url, const std::string &authorityFile, const std::string &soapAction,
              const std::string &body);

@@ -56,8 +56,8 @@ std::string Repeat(std::size_t count, const Piece &piece) {
   return text;
 }
 
-/// Returns `piece` with its `~` replaced by blanks, so many that a document of 16 MiB has just fewer nodes and
-/// attributes than the limit. A piece has `nodes` of them.
+/// Returns `piece` with its `~` replaced by enough blanks that a document of 16 MiB has just fewer nodes and attributes
+/// than the limit. One piece has `nodes` nodes and attributes.
 Piece Thin(std::string piece, std::size_t nodes) {
   constexpr std::size_t OCTETS_A_NODE = 17;
   const std::size_t blanks = nodes * OCTETS_A_NODE - std::min(piece.size(), nodes * OCTETS_A_NODE);
@@ -65,7 +65,7 @@ Piece Thin(std::string piece, std::size_t nodes) {
   return Always(std::move(piece));
 }
 
-/// Prefixes that the 32-bit hash FNV-1a, with its halves combined, puts into the same one of 128 buckets.
+/// One of the prefixes that the 32-bit hash FNV-1a, with its halves combined, puts into the first of 128 buckets.
 std::string CollidingPrefix(std::size_t index) {
   static const std::vector<std::string> prefixes = [] {
     constexpr std::uint32_t BUCKETS = 128;
@@ -258,7 +258,8 @@ std::string Before(std::string_view place) {
   return std::string(place);
 }
 
-/// The signature over the digests is genuine here, so every token of the right form is digested.
+/// What these shapes change is covered by a digest, but the signature over the digests stays genuine. So the verifier
+/// digests every token of the right form.
 /// Long because each shape is an entry of its own.
 void AddSignedContent(ShapeList &shapes) {
   const std::string value(VALUE);

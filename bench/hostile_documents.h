@@ -14,7 +14,7 @@ namespace Bench {
 /// One kind of hostile document, in any size.
 struct HostileShape {
   std::string name;
-  /// Makes a document of about that many octets, but not more.
+  /// Makes a document of about `octets` octets, but not more.
   std::function<std::string(std::size_t octets)> make;
 };
 

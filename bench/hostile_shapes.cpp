@@ -1,7 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// Compares the cost, for each octet, of hostile documents until `CreateSamlToken` refuses or accepts them with that of
-/// a genuine token of 5 MB.
+/// Compares the cost of hostile documents, until `CreateSamlToken` refuses or accepts them, with the cost of a genuine
+/// token of 5 MB. All costs are for each octet.
 
 #include "counted_heap.h"
 #include "hostile_documents.h"
@@ -33,8 +33,8 @@ namespace {
 constexpr std::size_t KIB = 1024;
 constexpr std::size_t MIB = 1024 * KIB;
 
-/// A document that takes longer is read only once, and its shape is not tried in the next size: its growth is known by
-/// then.
+/// A document that takes longer is read only once, and its shape is not tried in the next size: its growth is known
+/// already.
 constexpr double TOO_LONG_SECONDS = 2;
 
 constexpr std::size_t OUTCOME_LENGTH = 90; // how much of a refusal a line shows
@@ -48,7 +48,7 @@ struct Settings {
 struct Cost {
   double nanosecondsPerOctet = 0;
   std::size_t heapOctets = 0; // the peak, without the text
-  std::string refusal;        // empty when it is accepted, because inserted content need not be signed
+  std::string refusal;        // empty when it is accepted, because some inserted content need not be signed
 };
 
 double CpuSeconds() {
@@ -115,7 +115,7 @@ void MeasureShape(const HostileShape &shape, const Tarvel::Crypto::CertificateLi
     cost = Measure(xml, trusted, settings.rounds);
     first = first == 0 ? cost.nanosecondsPerOctet : first;
     summary.ratio.Note(cost.nanosecondsPerOctet / summary.genuine, shape.name);
-    // Growth below a genuine token's cost is ignored: it is that of copying a text that no longer fits into the caches.
+    // Growth below a genuine token's cost is ignored: its reason is that a large text no longer fits into the caches.
     summary.growth.Note(cost.nanosecondsPerOctet / std::max(first, summary.genuine), shape.name);
     summary.heap.Note(static_cast<double>(cost.heapOctets), shape.name);
     std::printf(" %9.2f", cost.nanosecondsPerOctet);
@@ -176,8 +176,8 @@ Settings ReadArguments(const std::vector<std::string> &arguments) {
   return settings;
 }
 
-/// Keeps all memory in the process once it is allocated: otherwise the kernel's work of returning it again would be
-/// most of the cost of some documents, depending on earlier sizes.
+/// Keeps all memory in the process once it is allocated. Otherwise most of the cost of some documents would be the
+/// kernel's work of providing the same memory again, and would depend on earlier sizes.
 void KeepMemory() {
   ::mallopt(M_MMAP_MAX, 0);
   ::mallopt(M_TRIM_THRESHOLD, std::numeric_limits<int>::max());

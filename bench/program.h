@@ -1,6 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// Code that the benchmark programs share: it runs them interleaved, keeps the medians and writes the summary.
+/// Code that the benchmark programs share: it runs a program's benchmarks interleaved, keeps the medians and writes the
+/// summary.
 
 #pragma once
 
@@ -24,7 +25,7 @@ using Medians = std::map<std::string, Median>; // by the benchmark's name, such 
 struct Program {
   const char *name;
   void (*registerBenchmarks)();
-  /// Writes one JSON object with one member, the program's name. The first and last lines are the object's braces.
+  /// Writes one JSON object with one member, named after the program. The first and last lines are the object's braces.
   void (*writeSummary)(const Medians &medians, std::ostream &out);
 };
 

@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// Compares building a signed request with the one signature that no such request can avoid.
+/// Compares building a signed request with the one signature that every such request needs.
 
 #include "program.h"
 
@@ -28,7 +28,7 @@ namespace {
 const std::string KEY_FILE = TOKEN_DATA_DIR "/holder.key"; // RSA-2048
 constexpr std::size_t RSA_2048_BYTES = 256;
 
-/// The parts of which requests are built. They are made once, as a service makes them.
+/// What requests are built from. It is made once, as in a service.
 struct Client {
   const SsoClient::RequestBuilderImpl builder{
       SsoClient::HolderOfKeyConfig{Tarvel::Crypto::LoadPrivateKey(KEY_FILE),
@@ -63,7 +63,7 @@ void BuildExchange(benchmark::State &state) {
   }
 }
 
-/// One RSA-2048 signature over a digest that exists already, with everything prepared that can be.
+/// One RSA-2048 signature over a digest that exists already, with all possible preparations made.
 class Limit {
 public:
   Limit() {

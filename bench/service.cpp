@@ -2,9 +2,9 @@
 /// @file
 /// Compares acquiring a token by password over loopback TLS with the work that cannot be avoided: the exchange of the
 /// same bytes, by libcurl, and one check of the token. The limit is the sum of the two; both in one loop are measured
-/// as well. Each exchange has a new connection, with a full handshake or a resumed one. The times are wall times, as
-/// the caller waits; the server runs in this process, and its share is in all figures. The last figures are the tokens
-/// that one service acquires in a second for several threads.
+/// as well. Each exchange has a new connection, with a full handshake or a resumed one. The times are wall times, which
+/// a caller waits for; the server runs in this process, and all figures include its work. The last figures are the
+/// tokens that one service acquires in a second for several threads.
 
 #include "canned_server.h"
 #include "curl_client.h"
@@ -134,8 +134,8 @@ void Exchange(benchmark::State &state, bool resumes) {
   }
 }
 
-/// The limit's two parts in one loop. This takes longer than the sum of the two alone: each time, the exchange has
-/// replaced the content of the processor's caches before the check, as it does in our operation.
+/// The limit's two parts in one loop. This takes longer than the sum of the two measured separately: each time, the
+/// exchange has replaced the content of the processor's caches before the check, as it does in our operation.
 void ExchangeAndVerify(benchmark::State &state, bool resumes) {
   Libcurl client(GetServer(resumes).GetUrl());
   client.Post();

@@ -33,7 +33,7 @@ struct Token {
   std::string xml;
 };
 
-/// By size, the smallest first. Those above 50 KB have the same groups more often.
+/// By size, the smallest first. Those above 50 KB repeat the groups of the token of 50 KB.
 const std::vector<Token> &GetTokens() {
   static const std::vector<Token> tokens{
       {"2k", ReadFile(TOKEN_DATA_DIR "/bearer-minimal.xml")}, {"5k", ReadFile(TOKEN_DATA_DIR "/bearer-5k.xml")},
@@ -71,7 +71,7 @@ void VerifyByXmlsec(benchmark::State &state, const std::string &xml) {
   }
 }
 
-/// One digest over a token's bytes and one check of an RSA-2048 signature, with everything prepared that can be.
+/// One digest over a token's bytes and one check of an RSA-2048 signature, with all possible preparations made.
 class Limit {
 public:
   Limit() {
@@ -156,7 +156,7 @@ void RegisterBenchmarks() {
   }
 }
 
-/// How many iterations that many threads do in a second.
+/// How many iterations `threads` threads together do in a second.
 double Throughput(const Medians &medians, const std::string &name, int threads) {
   return 1e6 / medians.at(name + "/scaling/real_time/threads:" + std::to_string(threads)).wallUs;
 }

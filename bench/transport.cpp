@@ -1,8 +1,8 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
 /// Compares a POST of 4 KB over loopback TLS, each over a new connection, with libcurl, which has the same settings and
-/// the same server: with full handshakes, and with resumed ones. The times are wall times, as the caller waits; the
-/// server runs in this process, and its share is in both figures.
+/// the same server: with full handshakes, and with resumed ones. The times are wall times, which a caller waits for;
+/// the server runs in this process, and both figures include its work.
 
 #include "canned_server.h"
 #include "curl_client.h"

@@ -39,7 +39,7 @@ const Text *GetTexts() {
 }
 constexpr std::size_t TEXTS = 3;
 
-/// The content that was read; the readers must agree in it.
+/// The content that a reader read. It must be the same for all readers.
 struct Content {
   std::size_t elements = 0;
   std::size_t textOctets = 0;

@@ -1,5 +1,6 @@
 # SPDX-License-Identifier: Apache-2.0
-# How our own code is compiled. Warnings are errors in our builds; a packager with a newer compiler turns SSOCLIENT_WERROR off.
+# How our own code is compiled. Warnings are errors in our builds; with a newer compiler, a packager can turn SSOCLIENT_WERROR
+# off.
 
 option(SSOCLIENT_WERROR "Treat warnings as errors" ${PROJECT_IS_TOP_LEVEL})
 
@@ -16,8 +17,8 @@ endif()
 if(CMAKE_CXX_COMPILER_ID STREQUAL "GNU" AND PROJECT_IS_TOP_LEVEL)
   target_compile_options(ssoclient_options INTERFACE --param=ggc-min-heapsize=524288)
 endif()
-# clang finds names that are reserved for the compiler and the standard library at no cost; clang-tidy's check for them takes a
-# sixth of its time. clang also finds comments that name a parameter which does not exist.
+# clang finds names that are reserved for the compiler and the standard library at no cost; clang-tidy's check for them would
+# take a sixth of its time. clang also finds comments about parameters that do not exist.
 if(CMAKE_CXX_COMPILER_ID MATCHES "Clang")
   target_compile_options(ssoclient_options INTERFACE -Wreserved-identifier -Wdocumentation)
 endif()
@@ -28,14 +29,15 @@ target_compile_options(ssoclient_options INTERFACE -fstack-protector-strong)
 # Most functions that a verification calls are in another library. Direct calls to their addresses make it a thirtieth faster
 # than calls through stubs that find the address at the first call.
 target_compile_options(ssoclient_options INTERFACE -fno-plt)
-# Otherwise Asio gives its symbols default visibility, and those of a host's Asio, of another version, would replace ours.
+# Otherwise Asio gives its symbols default visibility. If a host used another version of Asio, its symbols would replace ours.
 target_compile_definitions(ssoclient_options INTERFACE BOOST_ASIO_DISABLE_VISIBILITY)
 
 if(SSOCLIENT_SANITIZERS)
   list(JOIN SSOCLIENT_SANITIZERS "," sanitizers)
   add_compile_options(-fsanitize=${sanitizers} -fno-sanitize-recover=all -fno-omit-frame-pointer)
   add_link_options(-fsanitize=${sanitizers})
-  # With the sanitizers' instrumentation g++ wrongly reports use before initialisation in std::regex; its manual warns of this.
+  # With the sanitizers' instrumentation, g++ wrongly reports use before initialisation in std::regex; its
+  # manual warns of such reports.
   if(CMAKE_CXX_COMPILER_ID STREQUAL "GNU")
     target_compile_options(ssoclient_options INTERFACE -Wno-maybe-uninitialized)
   endif()

@@ -1,6 +1,6 @@
 # SPDX-License-Identifier: Apache-2.0
 # Compiles through ccache where it is installed. A source that was compiled before is not compiled again, even in another build
-# folder or another clone: ccache takes paths below the checkout as relative and ignores the build folder.
+# folder or another clone: ccache treats paths below the checkout as relative and ignores the build folder.
 
 option(SSOCLIENT_COMPILER_CACHE "Compile through ccache when it is installed" ${PROJECT_IS_TOP_LEVEL})
 

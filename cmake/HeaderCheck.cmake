@@ -1,6 +1,7 @@
 # SPDX-License-Identifier: Apache-2.0
 # Targets that compile the public headers with all our warnings, as C++17 and as C++20: header_check_17 and header_check_20
-# compile each header alone, header_check_together_17 and header_check_together_20 all in one source. header_check is all four.
+# compile each header alone; header_check_together_17 and header_check_together_20 compile all headers in one source.
+# header_check is all four.
 
 file(GLOB_RECURSE public_headers CONFIGURE_DEPENDS
   ${PROJECT_SOURCE_DIR}/include/*.h ${PROJECT_SOURCE_DIR}/tarvel/include/*.h

@@ -17,7 +17,7 @@ set(ssoclient_package_dir ${CMAKE_INSTALL_LIBDIR}/cmake/ssoclient)
 install(EXPORT ssoclient-targets NAMESPACE ssoclient:: DESTINATION ${ssoclient_package_dir} COMPONENT development)
 configure_package_config_file(cmake/ssoclient-config.cmake.in ${PROJECT_BINARY_DIR}/ssoclient-config.cmake
   INSTALL_DESTINATION ${ssoclient_package_dir})
-# Before 1.0 a minor release may change the interface, so a caller that requests 0.1 gets 0.1.
+# Before 1.0 a minor release may change the interface, so a project that requests 0.1 gets only 0.1.
 write_basic_package_version_file(${PROJECT_BINARY_DIR}/ssoclient-config-version.cmake COMPATIBILITY SameMinorVersion)
 install(FILES ${PROJECT_BINARY_DIR}/ssoclient-config.cmake ${PROJECT_BINARY_DIR}/ssoclient-config-version.cmake
   DESTINATION ${ssoclient_package_dir} COMPONENT development)
@@ -36,7 +36,7 @@ foreach(name tarvel ssoclient)
   install(FILES ${PROJECT_BINARY_DIR}/${name}.pc DESTINATION ${CMAKE_INSTALL_LIBDIR}/pkgconfig COMPONENT development)
 endforeach()
 
-# The handler over the GSSAPI is a separate option and component, so that without it no Kerberos is needed.
+# The handler over the GSSAPI is a separate option and component, so that the rest needs no Kerberos.
 if(TARGET ssoclient_gssapi)
   install(TARGETS ssoclient_gssapi EXPORT ssoclient-gssapi-targets
     RUNTIME COMPONENT gssapi

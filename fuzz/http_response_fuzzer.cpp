@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// HTTP responses: the outcome is the same in whatever pieces a response arrives; limits are kept; and only the
+/// HTTP responses: the outcome does not depend on the pieces in which a response arrives; limits are kept; and only the
 /// documented exception is thrown.
 
 #include "http/charset.h"

@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// Runs a fuzz target once on each file among its arguments, and on each file below a folder among them.
+/// Runs a fuzz target once on each file that is an argument, or is below a folder that is an argument.
 
 #include <cstddef>
 #include <cstdint>
@@ -13,7 +13,7 @@
 #include <vector>
 
 extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t *data, std::size_t size);
-/// Few targets need one, so it may be missing.
+/// Few targets define this function, so it may be missing.
 extern "C" __attribute__((weak)) int LLVMFuzzerInitialize(int *argc, char ***argv);
 
 namespace {

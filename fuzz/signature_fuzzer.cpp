@@ -83,8 +83,8 @@ const Node *FindTarget(const Document &document, std::string_view uri) {
   return target;
 }
 
-/// The canonical forms of what a signature claims to cover, without the signature. The algorithm of the signature does
-/// not matter here: documents that differ in this form differ in every other.
+/// The exclusive canonical forms of what a signature claims to cover, without the signature. It does not matter which
+/// canonical form the signature itself uses: documents that differ in this form differ in every other.
 std::set<std::string> CoveredForms(const Document &document, const ElementNode &signature,
                                    const std::set<std::string> &uris) {
   Tarvel::Xml::Security::CanonicalMethod method;
@@ -127,7 +127,7 @@ Ref<Tarvel::Xml::Security::Signature> ReadSignature(const Document &document, co
   return signature;
 }
 
-/// The forms that are covered in those seeds that one of the two keys signed.
+/// The forms that the signatures of genuine seeds cover: of those that one of the two keys signed.
 std::set<std::string> ReadGenuineForms() {
   std::set<std::string> all;
   for (const char *const name : {"c14n-inclusive-prefixes", "c14n-mixed", "ecdsa-p256-sha256", "reference-empty-uri",

@@ -31,8 +31,8 @@ using namespace SsoClient;
 using Tarvel::Crypto::CertificateList;
 using Tarvel::Xml::ElementNode;
 
-/// The facts of the seeds that the trusted key signed and that are valid now. No mutation of a seed can be another such
-/// token.
+/// The facts of the seeds that the trusted key signed and that are valid now. Mutating a seed cannot produce another
+/// such token.
 std::set<std::string> ReadGenuineFacts(const CertificateList &trusted) {
   std::set<std::string> facts;
   for (const char *const name : {"bearer", "bearer-minimal", "c14n-inclusive-prefixes", "delegated", "full",

@@ -47,7 +47,7 @@ void RecordBeginning(const Node &node, EventText &events) {
   }
 }
 
-/// The events from which the tree would be made.
+/// The events that a reader would report for such a tree.
 EventText RecordTree(const Node &top) {
   EventText events;
   const Node *node = &top;

@@ -1,12 +1,12 @@
 # SPDX-License-Identifier: Apache-2.0
-# What Doxygen reads of a public header: the same lines, with what our way of writing leaves to the reader made explicit.
+# What Doxygen reads of a public header: the same lines, but with everything made explicit that a reader of the header infers.
 # - Declarations without a blank line between them share the comment above the first, or above the namespace that begins with
 #   them; each gets it. What overrides a function has that function's comment.
 # - In a group of members (@name, @{) each gets the group's comment.
-# - Copying, moving, destroying and calling say nothing that the class's comment does not; they are left out unless they have
-#   a comment of their own.
+# - Functions that copy, move or destroy, and operator(), are left out unless they have a comment of their own: the class's
+#   comment says what there is to say. So are friends.
 # - What is protected is for the library's own classes, not for callers.
-# The number of lines stays the same, so that a warning names the right one.
+# The number of lines stays the same, so that a warning has the right number.
 
 # The part of a line that is code, with its string literals emptied.
 function CodeOf(line) {
@@ -33,7 +33,7 @@ function IsSpecialMember(code, name) {
   return code ~ (name "\\(const " name " &[a-z]*\\)") || code ~ (name "\\(" name " &&[a-z]*\\)")
 }
 
-# The end of the current declaration, of which this is one line.
+# Finds out, from one line of a declaration, whether the declaration continues on the next line.
 function Advance(code, net) {
   net = CountOf(code, "{") - CountOf(code, "}")
   if (bodyDepth > 0 || (net > 0 && code !~ /^ *(template <.*> )?(typedef )?(class|struct|enum|union|namespace|extern)( |$)/)) {

@@ -1,9 +1,10 @@
 # SPDX-License-Identifier: Apache-2.0
-# What Doxygen reads of a page: the same lines, where its Markdown differs from that of code hosts.
-# - It ends a code span at an apostrophe; in one between two backticks it does not.
-# - It reads "@name" as a command.
-# - A page gets its path as its identifier, and a heading the one that code hosts give it, after the page's. Links use these.
-# - A link to what is not part of the reference leads from build/docs/html into the project's folder.
+# What Doxygen reads of a page: the same lines, changed where Doxygen's Markdown differs from that of code hosts.
+# - Doxygen ends a code span at an apostrophe, unless two backticks begin and end the span.
+# - Doxygen reads "@name" as a command.
+# - The identifier of a page is its path. The identifier of a heading is the page's, followed by the one that code hosts give the
+#   heading. Links use these identifiers.
+# - A link to a file that is not part of the reference becomes a path from build/docs/html to that file.
 
 BEGIN {
   page = ARGV[1]

@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// Runs what the README shows: acquires a first token with the password in standard input, and admits its bearer.
+/// Runs what the README shows: acquires a first token with the password from standard input, and admits its bearer.
 
 #include <ssoclient/saml_token.h>
 #include <tarvel/core/secret_text.h>

@@ -33,7 +33,7 @@ inline std::size_t CountAllocatedBytes() {
 
 #ifndef TESTING_IS_SANITIZED
 #pragma GCC visibility push(default) // for the shared libraries
-// Other names of the C library's own functions, with which their replacements call them.
+// Other names of the C library's own functions. The replacements call them by these names.
 extern "C" {
 void *__libc_malloc(std::size_t size);
 void *__libc_calloc(std::size_t count, std::size_t size);

@@ -36,7 +36,8 @@ public:
 
   int GetCalls() const;
 
-  /// The outcome, once there is one: the message of the exception, "" for none, "(never called)".
+  /// Waits for the handler's call, and returns the message of its exception: "" for none, "(never called)" when it was
+  /// not called in time.
   std::string GetMessage() const;
 
   template <typename Expected>

@@ -14,15 +14,15 @@ namespace Testing {
 
 /// How a process has ended.
 struct ProcessEnd {
-  int exitCode = -1; ///< 128 plus the signal when one ended it
+  int exitCode = -1; ///< 128 plus the number of the signal, when one ended the process
   std::string out;   ///< the output after the ready line
 };
 
-/// A running service. A test program that uses one says so in CMake: ssoclient_needs_devsts(TARGET).
+/// A running service. A test program that uses one must declare it in CMake: ssoclient_needs_devsts(TARGET).
 class DevSts {
 public:
-  /// Starts the service on a free port and waits until it is ready. The first start in a build makes the keys and all
-  /// others use them, unless `arguments`, which come after --until-eof, give another --state.
+  /// Starts the service on a free port and waits until it is ready. The first start in a build makes the keys, and all
+  /// later starts use them, unless `arguments` has another --state. The service gets `arguments` after --until-eof.
   /// @throws std::runtime_error with the service's exit code and output when it is not ready within two minutes
   explicit DevSts(const std::vector<std::string> &arguments = {});
   DevSts(const DevSts &) = delete;

@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// Child processes of the test, made by `fork` as a host makes them, and memory that they share with it.
+/// Child processes of the test, made by `fork` as a host makes them, and memory that the test shares with them.
 
 #pragma once
 

@@ -84,7 +84,7 @@ Child Start(Command command) {
   const pid_t id = fork();
   if (id == 0) {
     prctl(PR_SET_PDEATHSIG, SIGKILL);
-    if (getppid() == parent) { // otherwise the parent has ended already, and no signal would come
+    if (getppid() == parent) { // otherwise the parent has ended already, and no signal would arrive
       dup2(open("/dev/null", O_RDONLY), STDIN_FILENO);
       dup2(pipe[1], STDOUT_FILENO);
       dup2(pipe[1], STDERR_FILENO);

@@ -14,17 +14,18 @@ namespace Testing {
 
 struct RealmSettings {
   std::string name = "EXAMPLE.TEST";
-  /// By how many seconds the centre's clock is fast, compared with the machine's; negative when it is slow.
+  /// The centre's clock minus the machine's clock, in seconds.
   int clockOffsetSec = 0;
   /// Whether clients adopt the centre's clock, as they do by default.
   bool adoptsClock = true;
 };
 
-/// Needs no root and does not change the machine's configuration: as long as it exists, KRB5_CONFIG of this process is
-/// the realm's configuration, and the other variables of Kerberos are unset. So it must be made before the test starts
-/// threads, and only one may exist at a time. The centre ends with this object, and also when this process is killed.
+/// Needs no root privileges and does not change the machine's configuration: as long as it exists, KRB5_CONFIG of this
+/// process is the realm's configuration, and the other variables of Kerberos are unset. So it must be made before the
+/// test starts threads, and only one may exist at a time. The centre ends with this object, and also when this
+/// process is killed.
 ///
-/// Principals are given without their realm, files of the realm's folder in Kerberos's form: "FILE:…".
+/// Principals are given without their realm. Files of the realm's folder are given in Kerberos's form, "FILE:…".
 class KerberosRealm {
 public:
   /// @throws std::runtime_error with the output of the program that failed

@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// `OperationOutcome`, the results that the completions of asynchronous operations got.
+/// `OperationOutcome`, the results with which asynchronous operations called their completions.
 
 #pragma once
 
@@ -38,8 +38,8 @@ public:
     };
   }
 
-  /// Waits for `count` calls of completions and returns their results, in order: "RESULT" of a success, "RESULT and
-  /// CLASS: MESSAGE" of a failure.
+  /// Waits for `count` calls of completions and returns their results, in order: "RESULT" for a success, "RESULT and
+  /// CLASS: MESSAGE" for a failure.
   std::vector<std::string> Wait(int count = 1) const {
     EXPECT_TRUE(m_state->called.WaitFor(count));
     const std::lock_guard<std::mutex> lock(m_state->mutex);
@@ -58,7 +58,7 @@ public:
     return m_state->threads;
   }
 
-  /// Waits until the last completion is destroyed, and with it the operation's work; false when that takes too long.
+  /// Waits until all completions are destroyed, which ends the operations' work; false when that takes too long.
   bool IsOver() const {
     return Eventually([this] { return m_state.use_count() == 1; });
   }

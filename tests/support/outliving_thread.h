@@ -1,7 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
 /// Threads that end after OpenSSL has cleaned itself up. The memory that OpenSSL keeps for such a thread is never
-/// freed: OpenSSL has deleted the key by which a thread finds it at its end.
+/// freed: OpenSSL has deleted the key by which the thread would find it when it ends.
 
 #pragma once
 

@@ -39,7 +39,7 @@ private:
 /// A context that trusts the authority of tests/data/tls.
 Tarvel::Ref<Tarvel::Ssl::SSLContext> ContextThatTrustsTheTestAuthority();
 
-/// The configuration for a service at `url` that signs like the fixture tokens.
+/// The configuration for a service at `url` that signs tokens with the key of the fixture tokens.
 SsoClient::SecurityTokenServiceConfig ConfigFor(const std::string &url);
 
 } // namespace Testing

@@ -16,7 +16,7 @@ std::size_t CountDescriptors();
 
 std::size_t CountThreads();
 
-/// Whether `condition` becomes true in bounded time. For events in the kernel, of which no notification exists.
+/// Whether `condition` becomes true in bounded time. For events in the kernel, which sends no notification of them.
 template <typename Condition>
 bool Eventually(const Condition &condition) {
   const auto end = std::chrono::steady_clock::now() + PATIENCE;

@@ -41,7 +41,7 @@ private:
   const std::shared_ptr<State> m_state;
 };
 
-/// The level of the client's logger, until the end of the scope.
+/// Sets the level of the client's logger until the end of the scope.
 class ScopedLogLevel {
 public:
   explicit ScopedLogLevel(int level);

@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// `ReportingSslContext`, an SSL context for tests of how long one is held.
+/// `ReportingSslContext`, for tests of how long an SSL context exists.
 
 #pragma once
 

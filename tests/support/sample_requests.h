@@ -34,7 +34,7 @@ SsoClient::TokenSpec PlainSpec();
 /// Everything that a spec can request, except a delegate.
 SsoClient::TokenSpec FullSpec();
 
-/// A spec with a text that is not ASCII in every text field except the delegate.
+/// A spec in which every text field except the delegate has characters beyond ASCII.
 SsoClient::TokenSpec BeyondAsciiSpec();
 
 SsoClient::TokenSpec DelegatedSpec();

@@ -4,7 +4,7 @@
 
 #pragma once
 
-// g++ and clang report it in different ways.
+// g++ and clang show in different ways whether a sanitizer is on.
 #if defined(__SANITIZE_ADDRESS__) || defined(__SANITIZE_THREAD__)
 #define TESTING_IS_SANITIZED 1
 #elif defined(__has_feature)

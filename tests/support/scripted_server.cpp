@@ -217,7 +217,7 @@ void ServerConnection::Close() {
   CloseWithoutNotice();
 }
 
-// Closing a descriptor with unread bytes sends a reset; so the bytes that have arrived are read first.
+// Closing a descriptor with unread bytes sends a reset, so this first reads the bytes that have arrived.
 void ServerConnection::CloseWithoutNotice() {
   if (m_descriptor < 0) {
     return;

@@ -1,7 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// A TCP or TLS server on loopback inside the test process, with a script for every step. It uses only sockets and
-/// OpenSSL, so that it shares no code with the library that it tests.
+/// A TCP or TLS server on loopback inside the test process. A script controls each connection. The server uses only
+/// sockets and OpenSSL, so that it shares no code with the library that it tests.
 
 #pragma once
 
@@ -46,16 +46,16 @@ public:
   ServerConnection &operator=(const ServerConnection &) = delete;
   ~ServerConnection();
 
-  /// Performs the handshake if the server has TLS; whether it succeeded. A script calls this first, unless it disturbs
-  /// the handshake.
+  /// Performs the handshake if the server has TLS, and returns whether it succeeded. A script calls this first, unless
+  /// it disturbs the handshake.
   bool Handshake();
 
   /// At most `limit` bytes; empty when the peer has ended the connection in any way.
   std::string ReadSome(std::size_t limit = 65536);
   /// Exactly `length` bytes, or fewer when the peer ends the connection.
   std::string ReadExactly(std::size_t length);
-  /// The bytes up to the first `delimiter`, with it, or all bytes when the peer ends the connection before. The next
-  /// read continues there.
+  /// The bytes up to and including the first `delimiter`, or all bytes if the peer ends the connection before it. The
+  /// next read continues there.
   std::string ReadUntil(std::string_view delimiter);
   /// One HTTP/1.1 request: its header, and the body that its Content-Length announces.
   std::string ReadRequest();
@@ -106,7 +106,7 @@ private:
 
 class ScriptedServer {
 public:
-  /// Runs once for each connection, several at once; the connection ends when it returns.
+  /// Runs for each connection, for several at the same time. The connection ends when the script returns.
   using Script = std::function<void(ServerConnection &)>;
 
   /// Listens on a free port of 127.0.0.1, or of ::1.

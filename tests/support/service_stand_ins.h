@@ -53,7 +53,7 @@ private:
   const std::function<void()> m_onCall;
 };
 
-/// Returns the service's answer to a request. An exception is a failure of the transport.
+/// Returns the service's answer to a request. If it throws, the transport fails with that exception.
 using Answer = std::function<std::string(const SsoClient::Request &)>;
 
 class TransportStandIn final : public SsoClient::Transport {

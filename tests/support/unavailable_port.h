@@ -34,7 +34,7 @@ public:
 
   /// Empties the queue. Later connections get an answer from `AnswerAll`.
   void Empty();
-  /// Answers each connection that sends a request, until `StopAnswering` is called on another thread.
+  /// Answers one request of each connection, until another thread calls `StopAnswering`.
   void AnswerAll(std::string_view bytes);
   void StopAnswering();
 

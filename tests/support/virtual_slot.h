@@ -10,8 +10,8 @@
 
 namespace Testing {
 
-/// The place of `function`, counted from 1, in the Itanium C++ ABI of g++ and clang; 0 for a function that is not
-/// virtual.
+/// The place of `function` in the table, counted from 1; 0 for a function that is not virtual. Reads the pointer as
+/// g++ and clang represent it, by the Itanium C++ ABI.
 template <typename Function>
 std::ptrdiff_t SlotOf(Function function) {
   std::array<std::ptrdiff_t, 2> parts{}; // offset or address, and adjustment of the object's address

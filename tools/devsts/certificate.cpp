@@ -82,7 +82,7 @@ bool HasStrongKey(const X509 &certificate) {
 }
 
 bool IsClientOf(X509 &certificate, X509 &authority) {
-  // Without the extension OpenSSL accepts a certificate for any purpose, so the token signer's would pass as a
+  // Without the extension, OpenSSL accepts a certificate for any purpose: the token signer's would be accepted as a
   // client's.
   if ((X509_get_extension_flags(&certificate) & EXFLAG_XKUSAGE) == 0) {
     return false;

@@ -40,7 +40,7 @@ bool IsClientOf(X509 &certificate, X509 &authority);
 /// "CN@O" of the subject; empty unless it has exactly one of each.
 std::string PrincipalOf(const X509 &certificate);
 
-/// The texts of OpenSSL's error queue, which is then empty.
+/// Returns the texts of OpenSSL's error queue, and empties it.
 std::string OpenSslErrors();
 
 } // namespace DevSts

@@ -78,7 +78,7 @@ std::string Charset::Encode(const std::string &answer) const {
     throw std::bad_alloc();
   }
   const int written = xmlOutputBufferWrite(out, LengthOf(answer), answer.data());
-  if (xmlOutputBufferClose(out) < 0 || written < 0) { // which releases the handler as well
+  if (xmlOutputBufferClose(out) < 0 || written < 0) { // closing also releases the handler
     throw std::runtime_error("an answer cannot be written in " + m_name);
   }
   return "<?xml version=\"1.0\" encoding=\"" + m_name + "\"?>" + ToString(*buffer);

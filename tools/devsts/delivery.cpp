@@ -8,7 +8,7 @@ namespace DevSts {
 
 namespace {
 
-// One more than the 16 MiB that a client can be expected to accept.
+// One byte more than 16 MiB, the most that a client can be expected to accept.
 constexpr std::size_t OVERSIZE_BYTES = 16U * 1024 * 1024 + 1;
 constexpr std::size_t DRIP_PIECES = 40;
 

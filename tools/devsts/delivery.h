@@ -33,7 +33,7 @@ struct HttpAnswer {
 /// How to send the answer with the fault. A connection that the client does not keep open is closed afterwards.
 Delivery Deliver(const HttpAnswer &answer, const Fault &fault, bool keepOpen);
 
-/// Whether the fault sends nothing of the answer, so that the request need not be processed.
+/// Whether the fault sends nothing of the answer. The request need not be processed then.
 bool IgnoresRequest(DeliveryFault fault);
 
 } // namespace DevSts

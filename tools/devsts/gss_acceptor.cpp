@@ -83,7 +83,7 @@ public:
         {{"keytab", keytabName.c_str()}, {"rcache", replayCache.c_str()}}};
     const gss_key_value_set_desc store = {elements.size(), elements.data()};
     gss_OID_set_desc mechanisms = {1, Kerberos()};
-    // For Kerberos first, since SPNEGO does not say why a keytab cannot be used.
+    // First for Kerberos, because SPNEGO does not report why a keytab cannot be used.
     Acquire(store, mechanisms);
     Release();
     mechanisms.elements = Spnego();

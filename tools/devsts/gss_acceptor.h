@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// The service's side of a SPNEGO negotiation, by the system's GSSAPI.
+/// The service's side of a SPNEGO negotiation, through the system's GSSAPI.
 
 #pragma once
 
@@ -12,7 +12,7 @@
 
 namespace DevSts {
 
-/// The result of a leg of the client.
+/// The result of accepting a leg of the client.
 struct AcceptedLeg {
   std::vector<unsigned char> answer;
   std::optional<std::string> client; ///< such as "alice@CORP.EXAMPLE", once the negotiation is complete

@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// The development token service: starts, writes the ready line, and waits for the reason to end.
+/// The development token service: starts, writes the ready line, and serves until it must end.
 
 #include "https_listener.h"
 #include "options.h"
@@ -27,7 +27,7 @@
 namespace DevSts {
 namespace {
 
-/// Allows as many descriptors, and so connections, as the hard limit of the process.
+/// Raises the limit of descriptors, and so of connections, to the hard limit of the process.
 void RaiseDescriptorLimit() {
   rlimit limit{};
   if (getrlimit(RLIMIT_NOFILE, &limit) == 0) {

@@ -29,12 +29,12 @@ struct CheckedMessage {
   xmlNode *request = nullptr;                     ///< the one element in the body
   std::optional<PasswordCredentials> credentials; ///< not yet compared with anything
   std::optional<TokenFacts> presentedToken;       ///< from the header: issued by this service, and valid now
-  /// Set when the message is signed: over the body and the timestamp, by the key of this certificate.
+  /// Null when the message is not signed. Otherwise the key of this certificate has signed the body and the timestamp.
   Certificate signer;
   std::string signatureId; ///< the signature's own identifier; empty when it has none
 };
 
-/// How far clocks may differ, and who signs tokens.
+/// How far clocks may differ, and which key signs tokens.
 struct MessagePolicy {
   std::chrono::seconds tolerance{60};
   const SignatureKey *tokenSigner = nullptr;

@@ -26,7 +26,7 @@ struct NegotiatedRequest {
 
 struct NegotiationStep {
   AcceptedLeg leg;
-  NegotiatedRequest request; ///< once the negotiation is complete
+  NegotiatedRequest request; ///< set only when the negotiation is complete
 };
 
 /// A negotiation is found by its context identifier, and removed when it is complete, refused, or a minute old. Any

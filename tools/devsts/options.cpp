@@ -28,7 +28,7 @@ std::string Footer() {
          "      Also negotiates, for every service whose key is in the keytab. alice@CORP.EXAMPLE is the user\n"
          "      alice@corp.example.\n"
          "  ssoclient-devsts --state DIR --charset ISO-8859-1\n"
-         "      Reads requests as ISO-8859-1, as services do that get no charset, and answers in it.\n"
+         "      Reads requests as ISO-8859-1 and answers in it, like a service whose requests declare no charset.\n"
          "  ssoclient-devsts --state DIR --fault wrong-signer\n"
          "      Signs every token with a key that no client trusts.\n";
 }
@@ -56,7 +56,7 @@ std::variant<Options, int> ReadOptions(int argc, char **argv) {
   app.add_option("--state", options.state, "Folder for keys and certificates; created when it does not exist")
       ->required();
   app.add_option("--port", options.port, "Port to listen on; 0 chooses a free one")->capture_default_str();
-  app.add_option("--users", options.users, "JSON file of the users; without it there are two")->type_name("FILE");
+  app.add_option("--users", options.users, "JSON file of the users; without it, alice and bob")->type_name("FILE");
   app.add_option("--keytab", options.keytab, "Keytab of the service's keys, for SPNEGO with Kerberos")
       ->type_name("FILE");
   app.add_option("--fault", faultName, "Misbehave at every request; the names are listed below")->type_name("NAME");

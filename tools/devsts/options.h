@@ -26,8 +26,8 @@ struct Options {
   bool untilEof = false;
 };
 
-/// The options; or the exit code, when the command line is wrong or asks for help. The help or the error has then been
-/// written.
+/// Returns the options. When the command line is wrong or asks for help, writes the error or the help, and returns the
+/// exit code.
 std::variant<Options, int> ReadOptions(int argc, char **argv);
 
 } // namespace DevSts

@@ -36,7 +36,7 @@ constexpr FaultCode INVALID_TIME_RANGE{Ns::WST, "InvalidTimeRange"};
 constexpr FaultCode UNABLE_TO_RENEW{Ns::WST, "UnableToRenew"};
 } // namespace Code
 
-/// A message is refused. The service answers with a SOAP fault.
+/// Thrown when a message is refused. The service answers with a SOAP fault.
 class Refusal : public std::runtime_error {
 public:
   Refusal(const FaultCode &code, const std::string &reason) : std::runtime_error(reason), m_code(code) {}

@@ -15,7 +15,7 @@ namespace {
 
 constexpr std::string_view PATH = "/sts";
 constexpr std::string_view FAULT_PATH = "/sts/fault/";
-constexpr std::string_view ONCE = "/once/"; // follows the name of a fault; each text after it has a "once" of its own
+constexpr std::string_view ONCE = "/once/"; // follows the name of a fault; each path with it is counted separately
 constexpr std::string_view MEDIA_TYPE = "text/xml";
 
 std::string Lower(std::string_view text) {

@@ -41,7 +41,7 @@ private:
   Delivery Answer(const HttpRequest &request) const;
   /// The fault in a path below /sts/fault/; none for an unknown name.
   std::optional<Fault> FaultOf(std::string_view path) const;
-  /// Whether this is the first request with that text.
+  /// Whether this is the first request to that path, which contains /once/.
   bool IsFirst(std::string_view onceOnly) const;
 
   const TokenService &m_service;

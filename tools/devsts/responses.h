@@ -27,7 +27,7 @@ Document RenewResponse(const xmlDoc &token);
 /// The answer to a validate request.
 Document ValidateResponse(bool isValid);
 
-/// A SOAP fault. A null code leaves the element out.
+/// A SOAP fault. If `code` is null, the fault has no faultcode element.
 Document FaultResponse(const FaultCode *code, const std::string &reason);
 
 } // namespace DevSts

@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// Waiting for the reason to end.
+/// Waiting until the service must end.
 
 #pragma once
 
@@ -15,7 +15,7 @@ public:
   EndSignals &operator=(const EndSignals &) = delete;
   ~EndSignals();
 
-  /// Returns at one of the signals or, if `untilEof` is set, at the end of standard input.
+  /// Returns when one of the signals arrives or, if `untilEof` is set, at the end of standard input.
   void Wait(bool untilEof) const;
 
 private:

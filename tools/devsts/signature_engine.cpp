@@ -29,7 +29,7 @@ struct ContextDeleter {
 };
 using Context = std::unique_ptr<xmlSecDSigCtx, ContextDeleter>;
 
-// The service itself logs a refusal, in one line.
+// The messages of the libraries are dropped, because the service itself logs each refusal, in one line.
 void DropError(const char *, int, const char *, const char *, const char *, int, const char *) {}
 void DropXmlError(void *, const char *, ...) {} // NOLINT(cert-dcl50-cpp): libxml2's own signature
 
@@ -46,7 +46,7 @@ Context NewContext(const SignatureKey &key) {
   return context;
 }
 
-/// The element's algorithm. @throws Refusal unless it is the expected one, without parameters
+/// Checks the element's algorithm. @throws Refusal unless it is the expected one, without parameters
 void RequireAlgorithm(const xmlNode &method, std::string_view expected) {
   const std::string algorithm = AttributeOf(method, "Algorithm").value_or("");
   if (algorithm != expected || !ChildElements(method).empty()) {

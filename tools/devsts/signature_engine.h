@@ -49,7 +49,7 @@ struct SignatureReference {
 /// preceded by "enveloped".
 std::vector<SignatureReference> ReadReferences(const xmlNode &signature);
 
-/// Whether the signature's value and all digests are right, by this key and whatever `KeyInfo` says. Call it after
+/// Whether the signature's value, checked with `key` whatever `KeyInfo` says, and all digests are right. Call it after
 /// `RegisterIdentifiers` for the document and a successful `ReadReferences`.
 bool VerifiesWith(xmlNode &signature, const SignatureKey &key);
 

@@ -19,7 +19,8 @@ Time Now();
 /// For example "2026-01-02T03:04:05.006Z".
 std::string TimeText(Time time);
 
-/// Reads that form. The fraction is optional, and cut to milliseconds. Returns none for any other text.
+/// Reads the form that `TimeText` writes. The fraction is optional, and cut to milliseconds. Returns none for any other
+/// text.
 std::optional<Time> ParseTime(std::string_view text);
 
 } // namespace DevSts

@@ -30,8 +30,8 @@ struct AdviceEntry {
 struct TokenFacts {
   std::string subject;     ///< such as "alice@corp.example"
   Time authenticated;      ///< when the subject was authenticated
-  std::string context;     ///< how: a SAML authentication context class
-  std::string certificate; ///< Base64 DER of the holder's; empty for a bearer token
+  std::string context;     ///< how it was authenticated: a SAML authentication context class
+  std::string certificate; ///< the holder's, as Base64 of its DER form; empty for a bearer token
   Time notBefore;
   Time notOnOrAfter;
   std::uint64_t renewals = 0;    ///< how often the token may still be renewed

@@ -19,7 +19,7 @@ enum class RequestType { ISSUE, RENEW, VALIDATE };
 struct TrustRequest {
   RequestType type = RequestType::ISSUE;
   bool wantsHolderOfKey = false;
-  std::optional<std::string> useKey; ///< the identifier of the signature whose key the token is to be bound to
+  std::optional<std::string> useKey; ///< the identifier of the signature to whose key the token must be bound
   std::chrono::milliseconds lifetime{0};
   bool renewable = false;
   bool delegable = false;
@@ -30,7 +30,7 @@ struct TrustRequest {
   const xmlNode *binaryExchange = nullptr; ///< a leg of a negotiation; null when there is none
 };
 
-/// The name of the request type, with which the SOAP action ends too.
+/// The name of the request type. The SOAP action ends with it, too.
 const char *RequestTypeName(RequestType type);
 
 /// @throws Refusal (wst:InvalidRequest, wst:InvalidTimeRange)

@@ -33,7 +33,7 @@ Node &RequireMemory(Node *node) {
 // Called by libxml2 as soon as it sees a DOCTYPE, before it reads any declaration in it.
 void StopAtDoctype(void *context, const xmlChar *, const xmlChar *, const xmlChar *) {
   auto *const parser = static_cast<xmlParserCtxt *>(context);
-  parser->_private = parser; // marks that the DOCTYPE is why it stopped
+  parser->_private = parser; // marks that it stopped because of the DOCTYPE
   xmlStopParser(parser);
 }
 

@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// Prints the version of the headers, that of the library, and that of the CMake package, a line each.
+/// Prints the versions of the headers, of the library and of the CMake package, each on one line.
 
 #include <ssoclient/version.h>
 

@@ -1,5 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
-// Loads a plug-in, lets it work, and closes it. The library's threads still run, so its code must stay loaded.
+// Loads a plug-in, lets it work, and closes it. The library's threads still run then, so its code must stay loaded.
 #include <dlfcn.h>
 
 #include <chrono>
