@@ -83,7 +83,7 @@ TEST_P(FreedMemory, ContainsNoPasswordOfADestroyedRequest) {
   EXPECT_EQ(watch.Found(), 0);
 }
 
-// The whole request fits into a buffer that the later parts of a longer one would overwrite.
+// The whole request fits into one buffer. The later parts of a longer request would overwrite that buffer.
 TEST_P(FreedMemory, ContainsNoPasswordOfADestroyedShortRequest) {
   const RequestBuilderImpl builder(boost::none);
   const std::string password = GetParam();
