@@ -1,5 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
-// Validates each request against the schemas of its standards: those that Debian packages, and those in
+// Validates each request against the schemas of its standards: those in packages of Debian, and those in
 // tests/data/schemas.
 //
 // Every element of every request is valid. These differences from the standards remain, which the schemas do not
@@ -47,7 +47,7 @@ public:
   Schemas() {
     xmlSetExternalEntityLoader(xmlNoNetExternalEntityLoader);
     const std::string path = DataPath("schemas/request.xsd");
-    std::string warnings; // there is one for each import that was imported already
+    std::string warnings; // there is one for each schema that is imported again
     const std::unique_ptr<xmlSchemaParserCtxt, decltype(&xmlSchemaFreeParserCtxt)> parser(
         xmlSchemaNewParserCtxt(path.c_str()), &xmlSchemaFreeParserCtxt);
     xmlSchemaSetParserErrors(parser.get(), Gather, Gather, &warnings);
