@@ -158,8 +158,8 @@ TEST_P(FreedMemory, ContainsNoPasswordOfACompletedAsynchronousOperation) {
   EXPECT_EQ(watch.Found(), 0);
 }
 
-/// Posts the secret, alone and after much padding, to a service that never reads it: this process must have no copy
-/// except the test's.
+/// Posts the secret, first without padding and then after much of it, to a service that never reads it. This process
+/// must have no copy except the test's.
 int CountFindsOfPosts(const char *secret, const Testing::ScriptedServer::Script &script,
                       std::optional<Testing::TlsSettings> tls, std::int64_t timeout) {
   Testing::ServiceStandIn service(script, tls, timeout);
