@@ -6,8 +6,8 @@
 // detect:
 // - wst:UseKey/@Sig is a plain identifier, although WS-Trust 1.3 requires a URI reference to the signature ("#...").
 //   As an xs:anyURI it is still valid.
-// - wst:BinaryExchange/@ValueType is the SPNEGO URI of the WS-Trust of February 2005: WS-Trust 1.3 leaves it open.
-// - wsse11:TokenType has "tokenprofile" where the SAML Token Profile 1.1 has "token-profile": the attribute is open.
+// - wst:BinaryExchange/@ValueType is the SPNEGO URI of WS-Trust of February 2005: WS-Trust 1.3 allows any URI.
+// - wsse11:TokenType has "tokenprofile", but the SAML Token Profile 1.1 has "token-profile". The schema allows any URI.
 // - an audience or an advice source that is not a URI is sent as it is, although its type in the schemas is xs:anyURI.
 //   The samples have URIs.
 #include "exchange/request_builder_impl.h"

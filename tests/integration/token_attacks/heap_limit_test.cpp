@@ -52,7 +52,7 @@ std::string WithElements(const std::string &end, std::size_t nodes) {
 
 constexpr std::size_t LEFT_BESIDE_ELEMENTS = MAX_DOCUMENT_BYTES - 4 * MAX_NODES - 20;
 
-/// Decoded piece by piece, which makes a buffer grow.
+/// A text with many references, which is copied piece by piece.
 std::string DecodedInPieces() {
   const std::string piece = REFERENCE + std::string(1000, 'x');
   return Repeated(piece, LEFT_BESIDE_ELEMENTS / piece.size());
@@ -75,7 +75,7 @@ std::string WithAttribute() {
   return WithElements("<b c='" + LongestDecoded() + "'/>", 2);
 }
 
-/// The reader keeps a copy of the name as long as the element is open.
+/// The reader keeps a copy of the namespace name as long as the element is open.
 std::string WithDeclaration() {
   return WithElements("<b xmlns:c='" + LongestDecoded() + "'/>", 2);
 }
