@@ -12,7 +12,7 @@ namespace Testing {
 
 Reading ReadWithPlatform(std::string_view document);
 
-/// Reads with the same reader, but without the parser, which would copy the document first.
+/// Like `ReadWithPlatform`, but without the parser, which would copy the document first.
 Reading ReadInPlace(std::string_view document);
 
 /// libxml2's SAX2 interface with namespaces. It refuses a document that is not well-formed or has a namespace error

@@ -10,7 +10,7 @@ namespace Testing {
 
 namespace {
 
-/// Whether a document that is cut at the place of `refusal` may be refused elsewhere. `before` is what is read from it.
+/// Whether a document that is cut at the place of `refusal` may be refused elsewhere. `before` is its reading.
 bool IsJudgedBefore(const Reading &refusal, const Reading &before) {
   // The first four octets are checked before all others.
   if (refusal.message == "the document is UTF-16 or UTF-32, or begins with a null byte; only UTF-8 is accepted") {
