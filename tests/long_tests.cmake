@@ -2,7 +2,7 @@
 # ctest reads this after it has listed the tests. The longest tests start first. Two labels:
 #   in_full  a test whose point is repetition: it repeats less often unless SSOCLIENT_TESTS_IN_FULL is set, which
 #            scripts/check in_full does; all of integration_signature_oracle has the label too
-#   waits    a test that waits for a time-out of the library that cannot be shortened
+#   waits    a test that waits for a time-out of the library, which cannot be shortened
 
 # ssoclient_mark(COST LABEL TEST…)
 function(ssoclient_mark cost label)

@@ -1,7 +1,7 @@
 # SPDX-License-Identifier: Apache-2.0
-# Takes the code blocks out of pages and header comments: block N becomes the file FOLDER/N.LANGUAGE, and is listed as
-# "N LANGUAGE FILE LINE" with the line before its first one. A block without a language, or in one that is not listed
-# here, is an error. In a header's comment, lines that are indented by four after an empty line are a C++ block, too.
+# Extracts the code blocks from pages and header comments: writes block N to the file FOLDER/N.LANGUAGE, and prints
+# "N LANGUAGE FILE LINE", where LINE is the line before the block's first one. A block without a language, or in an unknown
+# language, is an error. In a header's comment, lines that are indented by four after an empty line are a C++ block, too.
 #
 # usage: awk -v folder=FOLDER -f blocks.awk FILE…
 

@@ -1,6 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// What a C++ block without an #include of its own may use: these headers and, outside of functions, these parameters.
+/// What a C++ block without an #include may use: these headers and, unless it defines a function or a class, these
+/// parameters.
 
 #pragma once
 

@@ -1,8 +1,8 @@
 # SPDX-License-Identifier: Apache-2.0
-# Makes a source of one C++ block, on standard output. A block with an #include is a source as it is, which includes all
-# that it uses. Any other is a fragment: it may use what fragment.h includes, and unless it defines a function, a class or
-# an alias, it is a block in a function with the parameters that are named there. In a header's comment the names of the
-# libraries' namespaces may be used alone. A line "..." stands for code that is left out.
+# Prints a source made from one C++ block. A block with an #include is a source already, and includes all that it uses. Any
+# other block is a fragment: it may use what fragment.h includes, and unless it defines a function, a class or an alias, it
+# becomes the body of a function with the parameters in that file. A header's comment need not write the names of the
+# libraries' namespaces. A line "..." means that code is left out.
 #
 # usage: awk -v number=N -v page=FILE -v line=LINE -f sources.awk BLOCK BLOCK
 

@@ -237,7 +237,7 @@ TEST(SocketAfterFork, ConnectsInAChildThatACompletionMade) {
   EXPECT_EQ(Read(*socket), "parent");
 }
 
-// The completion waits for a lock that the forking thread holds.
+// The completion waits at a gate, which the forking thread opens only after the fork.
 TEST(Fork, DoesNotWaitForACompletionThatWaitsForTheHost) {
   const ServerProcess server(Echo);
   Testing::Gate gate;
@@ -305,7 +305,7 @@ TEST_P(TlsAfterFork, UsesTheParentsContextInTheChildWithoutItsSessions) {
   const std::size_t left = countSessions();
   EXPECT_EQ(RunInChild([&] {
               EXPECT_EQ(countSessions(), 0u);
-              // The sessions of these two are not for the child either.
+              // The child does not keep the sessions of these two connections either.
               closed->GetStream()->Close();
               dropped.reset();
               EXPECT_EQ(countSessions(), 0u);

@@ -119,7 +119,7 @@ TEST(ForkGate, LetsAThreadForkWithinAComputationThatAnotherForkWaitsFor) {
   within.join();
 }
 
-// A module of OpenSSL that starts a program under a lock of its own may do so.
+// For example, a module of OpenSSL may start a program while it holds a lock that another thread waits for.
 TEST(ForkGate, DoesNotWaitForAThreadThatWaitsForALockOfTheForkingOne) {
   std::mutex held;
   Testing::EventCount waiting;
@@ -176,7 +176,7 @@ TEST(ForkGate, LetsTwoThreadsForkAtOnce) {
   other.join();
 }
 
-TEST(ForkGate, CountsOneForkMoreInEachChild) {
+TEST(ForkGate, CountsOneMoreForkInEachChild) {
   Compute(); // forks before the first computation do not count
   const unsigned own = GetForkGeneration();
   EXPECT_EQ(RunInChild([&] {

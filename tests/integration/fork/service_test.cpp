@@ -199,7 +199,7 @@ private:
   pid_t &m_child;
 };
 
-// The service's answer is not a leg, which both processes report when their requests have been answered.
+// The service's answer is not a leg. Each process reports that once its request has been answered.
 TEST_P(ServiceAfterFork, ContinuesInBothProcessesWhenTheHandlerForks) {
   pid_t child = -1;
   ForkingHandler handler(child);
@@ -245,7 +245,7 @@ TEST_P(ServiceAfterFork, VerifiesAndAcquiresInEachChildOfABusyParent) {
 INSTANTIATE_TEST_SUITE_P(Transport, ServiceAfterFork, testing::Bool(),
                          [](const auto &isSecure) { return isSecure.param ? "Tls" : "PlainHttp"; });
 
-/// A request that has been started and that `server` does not answer yet.
+/// Starts a request that `server` does not answer yet.
 Ref<Tarvel::Http::PendingRequestItem> StartSlowRequest(const Service &server, const Ref<Tarvel::Http::UserAgent> &agent,
                                                        const Shared<std::atomic<int>> &calls) {
   const Ref<Tarvel::Http::ClientRequest> request = Tarvel::Http::CreateHttpRequest("POST", "/sts");

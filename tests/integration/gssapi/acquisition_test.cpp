@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
-// Tokens for Kerberos tickets, over TLS from the development service, which accepts them with the system's GSSAPI. They
-// are acquired with the library's handler, or leg by leg.
+// Tokens in exchange for Kerberos tickets. The development service issues them over TLS, and accepts the tickets with
+// the system's GSSAPI. The tests acquire a token in one call, or negotiate leg by leg.
 
 #include "integration/gssapi/service_world.h"
 #include "support/process_resources.h"

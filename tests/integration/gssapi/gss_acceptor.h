@@ -20,7 +20,7 @@ public:
   GssAcceptor(const std::string &keytab, const std::filesystem::path &folder);
 
   /// Accepts the client's leg.
-  /// @return the service's leg; after a failure there may be one too, which reports it to the client.
+  /// @return the service's leg; after a failure, it reports the failure to the client, or is empty.
   std::vector<std::uint8_t> Accept(const std::vector<std::uint8_t> &leg);
 
   bool IsComplete() const noexcept { return m_isComplete; }

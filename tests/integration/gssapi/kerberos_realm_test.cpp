@@ -68,7 +68,7 @@ RealmFacts EndProcessWithRealm(int signal) {
 }
 
 TEST(KerberosRealm, EndsItsCentreWhenTheTestIsKilled) {
-  ASSERT_EQ(prctl(PR_SET_CHILD_SUBREAPER, 1), 0); // so that the orphan's end can be waited for here
+  ASSERT_EQ(prctl(PR_SET_CHILD_SUBREAPER, 1), 0); // so that this process can wait for the orphan's end
   for (const int signal : {SIGKILL, SIGABRT, SIGTERM}) {
     const RealmFacts facts = EndProcessWithRealm(signal);
     int status = 0;

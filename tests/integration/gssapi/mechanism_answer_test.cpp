@@ -46,7 +46,7 @@ extern "C" OM_uint32 AlteredImportName(OM_uint32 *minor, gss_buffer_t text, gss_
 namespace SsoClient::Gssapi {
 namespace {
 
-TEST(Mechanism, MakesANameThatItRefusesAnInvalidArgument) {
+TEST(Mechanism, ReportsARefusedNameAsAnInvalidArgument) {
   g_acceptsNoNames = true;
   EXPECT_THROWS_MESSAGE(CreateSpnegoHandler(Testing::SettingsFor()), Tarvel::InvalidArgumentException,
                         "Invalid argument : 'sts@localhost' is not a valid name: An invalid name was supplied");

@@ -1,5 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
-// Negotiations that fail in the realm, at the service, or by the service's answer.
+// Negotiations that fail in the realm, at the service, or because of the service's answer.
 
 #include "integration/gssapi/negotiation_fixture.h"
 #include "support/throws_message.h"
@@ -57,7 +57,7 @@ TEST(Negotiation, FailsWhenTheRealmDoesNotAnswer) {
 struct WrongClock {
   std::string name;
   int offsetSec;
-  std::string words; ///< the service's words, and those that reach the client
+  std::string words; ///< in the failure's text, at the service and at the client
 };
 
 void PrintTo(const WrongClock &clock, std::ostream *out) {
@@ -86,7 +86,7 @@ INSTANTIATE_TEST_SUITE_P(Realm, NegotiationWithAWrongClock,
                                          WrongClock{"Late", -1000, "Clock skew too great"}),
                          NameOfClock);
 
-TEST(Negotiation, FailsWhenTheServiceDoesNotHaveTheKeyOfTheRequestedOne) {
+TEST(Negotiation, FailsWhenTheServiceHasTheKeyOfAnotherService) {
   const RealmWithAlice world;
   world.LogIn();
   GssAcceptor service(world.realm.AddPrincipal("impostor/localhost"), world.realm.GetFolder());
@@ -126,7 +126,7 @@ std::string NameOf(const testing::TestParamInfo<InvalidLeg> &info) {
 
 class NegotiationWithAnInvalidLeg : public testing::TestWithParam<InvalidLeg> {};
 
-TEST_P(NegotiationWithAnInvalidLeg, FailsForGood) {
+TEST_P(NegotiationWithAnInvalidLeg, FailsPermanently) {
   const RealmWithAlice world;
   world.LogIn();
   const auto handler = CreateSpnegoHandler(SettingsFor());

@@ -59,7 +59,7 @@ inline int Negotiate(SsoClient::NegotiationHandler &client, GssAcceptor &service
 }
 
 /// Checks for an exception whose message begins with `ours` and continues with text of the Kerberos library. That text
-/// contains `words`; what comes before and after them differs between versions.
+/// contains `words`; the rest of it differs between versions.
 template <typename Expected, typename Statement>
 ::testing::AssertionResult FailsWithWords(const Statement &statement, const std::string &ours,
                                           const std::string &words) {

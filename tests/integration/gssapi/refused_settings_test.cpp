@@ -1,5 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
-// Settings for which no handler is made.
+// Settings that `CreateSpnegoHandler` refuses.
 
 #include "integration/gssapi/negotiation_fixture.h"
 #include "support/throws_message.h"

@@ -22,14 +22,14 @@ namespace Testing {
 /// alice's ticket in the default cache.
 class ServiceWorld {
 public:
-  /// @param arguments of the service, which come after its keytab
+  /// @param arguments further arguments of the service, after its keytab
   explicit ServiceWorld(const RealmSettings &settings = {.name = "CORP.EXAMPLE"},
                         const std::vector<std::string> &arguments = {});
 
   const KerberosRealm &GetRealm() const noexcept { return m_realm; }
   const DevSts &GetService() const noexcept { return m_service; }
 
-  /// The configuration for the service, or for its address at which it makes the fault `fault`.
+  /// The configuration for the service; with `fault`, for the address at which the service makes that fault.
   /// @param identity "client" for holder-of-key tokens; empty for none
   SsoClient::SecurityTokenServiceConfig MakeConfig(const std::string &fault = "",
                                                    const std::string &identity = "") const;

@@ -81,7 +81,7 @@ public:
   int GetFound() const { return g_found; }
 };
 
-// Wrong for every fixture, and longer than what a string keeps in itself.
+// Wrong for every test file, and too long for a string's inline buffer.
 const char PASSPHRASE[] = "correct-horse-battery-staple-and-more-than-fits-into-the-string-itself";
 
 std::string GivePassphrase() {

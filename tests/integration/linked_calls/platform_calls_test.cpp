@@ -141,7 +141,7 @@ TEST(CanonicalElementText, RequestsTheAlgorithmByItsNameWithANumberSign) {
   EXPECT_EQ(g_algorithms, Texts{"http://www.w3.org/TR/2001/REC-xml-c14n-20010315#"});
 }
 
-/// Starts every request, and has run out of memory when the caller waits for it.
+/// Starts every request, and throws when the caller waits for the response.
 class ExhaustedUserAgent final : public UserAgent {
 public:
   void StartRequest(const Ref<Tarvel::Http::ClientRequest> &, CompletionFunction,

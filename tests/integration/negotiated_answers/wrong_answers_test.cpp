@@ -47,7 +47,7 @@ const Form FORMS[] = {
 
 class EachFormOfNegotiationAnsweredWrongly : public testing::TestWithParam<Form> {
 protected:
-  /// How a negotiation ends whose first message gets the wrong answer, and how the next negotiation ends.
+  /// The outcome of a negotiation whose first message gets the wrong answer, and then that of the next negotiation.
   std::string OutcomesOf(const std::string &fault) const {
     const SecurityTokenServiceConfig config = m_world.MakeConfig(fault + "/once/" + GetParam().name);
     const auto negotiate = [&] { return GetParam().negotiate(config); };
@@ -80,7 +80,7 @@ TEST_P(EachFormOfNegotiationAnsweredWrongly, RefusesAWrongTokenAndNegotiatesAfte
   }
 }
 
-// The token in that leg is ignored, and the service expects no further leg.
+// The token in the final leg is ignored then, and the service expects no further leg.
 TEST_P(EachFormOfNegotiationAnsweredWrongly, ContinuesWhenTheFinalLegIsOutsideItsCollection) {
   EXPECT_EQ(OutcomesOf("wrong-wrapper"),
             std::string("SsoException: Unexpected SOAP fault: wst:InvalidRequest; request failed.") + THEN_A_TOKEN);

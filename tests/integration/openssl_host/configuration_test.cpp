@@ -104,7 +104,7 @@ const std::string EVERYTHING = "verification: done\n"
                                DONE;
 
 TEST_F(Configuration, IsNotRead) {
-  // To open this file would block for ever.
+  // Opening this file would block for ever.
   const std::string pipe = m_folder / "openssl.cnf";
   ASSERT_EQ(mkfifo(pipe.c_str(), 0600), 0);
   EXPECT_EQ(Run(TlsSettings(), {"use-everything"}, pipe), EVERYTHING);

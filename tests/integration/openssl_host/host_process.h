@@ -23,7 +23,7 @@ public:
   HostProcess &operator=(const HostProcess &) = delete;
   ~HostProcess();
 
-  /// Lets the process continue that waits for its server. May be called on any thread.
+  /// Ends the process's wait for its server. May be called on any thread.
   void Continue() noexcept;
 
   /// Waits for the process to end. Returns its output, followed by how it ended unless the exit code was 0.

@@ -56,7 +56,7 @@ TEST(TheEndOfTheProcess, EndsAReadThatWaitsForTheServer) {
             "read: InvalidStateException: " + ENDED + "read again: InvalidStateException: " + ENDED);
 }
 
-TEST(TheEndOfTheProcess, RefusesOperationsThatStartThen) {
+TEST(TheEndOfTheProcess, RefusesNewOperations) {
   ScriptedServer server(
       [](ServerConnection &connection) {
         connection.Handshake();

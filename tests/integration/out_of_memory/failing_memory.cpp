@@ -12,7 +12,7 @@ namespace Testing {
 
 namespace {
 
-std::atomic<long> g_left{0}; // until one fails; 0 if none is to fail
+std::atomic<long> g_left{0}; // allocations until one fails; 0 if none will fail
 std::atomic<bool> g_keepsFailing{false};
 std::atomic<bool> g_hasFailed{false};
 std::atomic<long> g_live{0};

@@ -8,10 +8,10 @@ namespace Testing {
 
 enum class Shortage {
   ONCE,      ///< one allocation fails, later ones succeed
-  FROM_THEN, ///< one allocation fails, and so do all later ones
+  FROM_THEN, ///< one allocation and all later ones fail
 };
 
-/// While it lives, the `number`th allocation from now on, counted from 1, fails, on any thread.
+/// While it lives, OpenSSL's `number`th allocation fails, counted from 1 on all threads together.
 class FailingMemory {
 public:
   FailingMemory(int number, Shortage shortage);

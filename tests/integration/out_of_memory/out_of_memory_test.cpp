@@ -62,7 +62,7 @@ std::map<std::string, int> Sweep(const std::function<void()> &operation, Shortag
   }
 }
 
-/// `full` is the outcome with enough memory. With a `step`, not every allocation fails in turn.
+/// `full` is the outcome with enough memory. Only every `step`th allocation fails in turn.
 void ExpectNothingElse(const std::function<void()> &operation, const std::string &full = "done", int step = 1) {
   for (const Shortage shortage : {Shortage::ONCE, Shortage::FROM_THEN}) {
     std::map<std::string, int> outcomes = Sweep(operation, shortage, step);
@@ -73,7 +73,7 @@ void ExpectNothingElse(const std::function<void()> &operation, const std::string
   }
 }
 
-/// Checks for leaks too: each failure that leaks memory is one of hundreds.
+/// Also checks for leaks: the operation fails many times, so that even a small leak adds up.
 class OutOfMemory : public testing::Test {
 protected:
   void ExpectNothingElse(const std::function<void()> &operation, const std::string &full = "done", int step = 1) {
@@ -146,7 +146,7 @@ TEST_F(OutOfMemory, IsReportedByPrivateKeys) {
     const std::string path = DataPath("crypto/" + name);
     ExpectNothingElse([path, answer] { Tarvel::Crypto::LoadPrivateKey(path, answer); }, "done", step);
   }
-  // Not by a URI: when memory runs out, OpenSSL 3.0's own loader uses null pointers.
+  // Keys at a URI are left out: when memory runs out, OpenSSL 3.0's own loader uses null pointers.
 }
 
 TEST_F(OutOfMemory, IsReportedByKeyStores) {

@@ -1,12 +1,12 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// Searches memory when it is freed. The program that is linked with freed_memory.cpp gets its allocation functions of C++.
+/// Searches memory when it is freed. A program that is linked with freed_memory.cpp uses its C++ allocation functions.
 
 #pragma once
 
 namespace Testing {
 
-/// Counts how many pieces of memory with `secret` in them are freed while it exists. One at a time.
+/// Counts how many pieces of memory with `secret` in them are freed while it exists. Only one may exist at a time.
 class FreedMemoryWatch {
 public:
   /// @param secret null-terminated; must outlive this object

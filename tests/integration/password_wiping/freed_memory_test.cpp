@@ -83,7 +83,7 @@ TEST_P(FreedMemory, ContainsNoPasswordOfADestroyedRequest) {
   EXPECT_EQ(watch.Found(), 0);
 }
 
-// The whole request fits into a buffer that the later parts of a longer one would overwrite.
+// The whole request fits into one buffer. The later parts of a longer request would overwrite that buffer.
 TEST_P(FreedMemory, ContainsNoPasswordOfADestroyedShortRequest) {
   const RequestBuilderImpl builder(boost::none);
   const std::string password = GetParam();
@@ -158,8 +158,8 @@ TEST_P(FreedMemory, ContainsNoPasswordOfACompletedAsynchronousOperation) {
   EXPECT_EQ(watch.Found(), 0);
 }
 
-/// Posts the secret, alone and after much padding, to a service that never reads it: this process must have no copy
-/// except the test's.
+/// Posts the secret, first without padding and then after much of it, to a service that never reads it. This process
+/// must have no copy except the test's.
 int CountFindsOfPosts(const char *secret, const Testing::ScriptedServer::Script &script,
                       std::optional<Testing::TlsSettings> tls, std::int64_t timeout) {
   Testing::ServiceStandIn service(script, tls, timeout);

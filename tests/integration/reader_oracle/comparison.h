@@ -15,11 +15,11 @@ namespace Testing {
 
 enum class Peer : std::uint8_t {
   LIBXML2 = 1,
-  EXPAT = 2,                ///< with the rules of namespaces that this test has written down
-  EXPAT_WITH_NAMESPACES = 4 ///< with its own
+  EXPAT = 2,                ///< without namespaces, which rules of this test check
+  EXPAT_WITH_NAMESPACES = 4 ///< with its own check of namespaces
 };
 
-/// One document, our reading and a peer's, which differ, and the readings of all peers.
+/// One document, our reading and a peer's that differs, and the readings by libxml2 and by expat without namespaces.
 struct Difference {
   std::string_view document;
   const Reading &ours;
@@ -45,7 +45,7 @@ struct AppliedRule {
 struct Comparison {
   Reading ours;
   std::vector<AppliedRule> rules; ///< those that were needed
-  std::string unexplained;        ///< a difference that no rule names, or empty
+  std::string unexplained;        ///< the differences that no rule explains; empty when there are none
 };
 
 /// Reads `document` with all readers.

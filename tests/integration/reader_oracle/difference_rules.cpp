@@ -70,7 +70,7 @@ bool ContainsIgnoringCase(std::string_view text, std::string_view lowerCase) {
   return std::search(text.begin(), text.end(), lowerCase.begin(), lowerCase.end(), isSame) != text.end();
 }
 
-/// Whether we refuse a quoted value in the XML declaration that is neither of these two, in any case of letters.
+/// Whether we refuse a quoted value in the XML declaration that is neither `one` nor `other`, whatever its case.
 bool IsOtherValueInDeclaration(const Difference &difference, std::string_view one, std::string_view other) {
   const std::string_view before = BeforeOurPosition(difference);
   const std::string_view rest = FromOurPosition(difference);

@@ -38,8 +38,8 @@ std::string_view LocalNameOf(std::string_view name) {
 }
 
 /// Whether `part`, a part of a valid XML name, is a name without a colon. The whole name begins with a character that
-/// may begin a name; the part after a colon may begin with one that only continues a name. Beyond ASCII expat has these
-/// characters from the fourth edition; the few that are tested here are the same in both editions.
+/// may begin a name, but the part after a colon may begin with one that may only continue a name. Beyond ASCII, expat
+/// has the characters of XML 1.0's fourth edition; the few that are tested here are the same in the fifth.
 bool IsColonless(std::string_view part) {
   if (part.empty() || part.find(':') != std::string_view::npos) {
     return false;
@@ -121,7 +121,8 @@ private:
     m_declarations.push_back({std::string(prefix), std::string(value)});
   }
 
-  /// @return the namespace of the name's prefix; null when it has none, or one that is not bound.
+  /// @return the namespace of the name's prefix; null when the name has no prefix, is not valid, or its prefix is not
+  /// bound.
   const std::string *CheckName(std::string_view name) {
     const std::size_t colon = name.find(':');
     if (colon == std::string_view::npos) {
@@ -168,8 +169,8 @@ std::string_view ToView(const char *text) {
   return text ? std::string_view(text) : std::string_view();
 }
 
-/// Feeds `document` to a parser that has its handlers for elements, and sets the others. `EVENTS` is the reading's
-/// text.
+/// Sets the parser's handlers except those for elements, which are set already, and parses `document`. The events
+/// become text in `EVENTS`.
 template <EventText Reading::*EVENTS>
 void Run(Session &session, std::string_view document) {
   const XML_Parser parser = session.parser;
@@ -199,7 +200,7 @@ void Run(Session &session, std::string_view document) {
   }
 }
 
-/// "URI\nlocal\nprefix", "URI\nlocal" or "local" as "prefix:local" or "local".
+/// The name in the form "prefix:local" or "local"; expat reports "URI\nlocal\nprefix", "URI\nlocal" or "local".
 std::string WrittenName(std::string_view triplet) {
   const std::size_t first = triplet.find(SEPARATOR);
   if (first == std::string_view::npos) {

@@ -350,7 +350,7 @@ private:
 
   RandomSource &m_random;
   const std::size_t m_oddity; // one in this many pieces is odd; 0: none
-  const bool m_isNarrow;      // few prefixes, namespaces and names, so that they meet
+  const bool m_isNarrow;      // few prefixes, namespaces and names, so that they coincide
   std::size_t m_elements = 0;
   std::vector<std::string> m_declared; // prefixes in scope
   std::string m_text;
@@ -403,7 +403,7 @@ std::string AtLimit(RandomSource &random) {
   }
 }
 
-/// ASCII only; other octets become characters of their own.
+/// For ASCII; each other octet becomes a separate character.
 std::string ToUtf16(std::string_view text, RandomSource &random) {
   const bool isBigEndian = random.OnceIn(2);
   std::string recoded = random.OnceIn(3) ? "" : isBigEndian ? "\xFE\xFF" : "\xFF\xFE";

@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// Documents generated from a seed, to compare readers with: many are well-formed, most of the others nearly.
+/// Documents generated from a seed, to compare readers: many are well-formed, and most of the others nearly are.
 
 #pragma once
 

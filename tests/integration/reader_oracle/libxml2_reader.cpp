@@ -11,7 +11,7 @@ namespace Testing {
 
 namespace {
 
-// One context reads many documents; the names that it keeps are dropped now and then.
+// A context keeps the names that it has read, so a new one replaces it after this many documents.
 constexpr std::size_t DOCUMENTS_OF_A_CONTEXT = 4096;
 constexpr int OPTIONS = XML_PARSE_NONET | XML_PARSE_HUGE | XML_PARSE_IGNORE_ENC | XML_PARSE_NOENT;
 
@@ -96,7 +96,7 @@ using ParserHandle = std::unique_ptr<xmlParserCtxt, decltype(&xmlFreeParserCtxt)
 
 ParserHandle MakeParser() {
   xmlInitParser();
-  // An error outside a parser, such as text that cannot be recoded, would be printed otherwise.
+  // Without this, libxml2 would print an error outside a parser, such as text that cannot be recoded.
   xmlSetStructuredErrorFunc(nullptr, [](void *, xmlErrorPtr) {});
   ParserHandle parser(xmlNewParserCtxt(), &xmlFreeParserCtxt);
   xmlSAXHandler table{};

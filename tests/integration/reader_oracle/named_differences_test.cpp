@@ -1,5 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
-// One document for each kind of intended difference, and the readers that read it differently from ours.
+// At least one document for each kind of intended difference, and the readers that read it differently from ours.
 
 #include "comparison.h"
 
@@ -91,7 +91,7 @@ TEST(NamedDifferences, AreThoseOfTheirExamples) {
   }
 }
 
-TEST(NamedDifferences, HaveOneExampleEach) {
+TEST(NamedDifferences, HaveAnExampleEach) {
   std::set<std::string> named;
   for (const Testing::DifferenceRule &rule : DifferenceRules()) {
     named.insert(rule.name);

@@ -63,7 +63,7 @@ bool IsWrongEndTag(const Reading &ours, const Reading &theirs) {
           Is(ours, "a name has a colon that is not between a prefix and a local name"));
 }
 
-/// We refuse it where it begins; libxml2 within it.
+/// We refuse a document type declaration where it begins, and libxml2 refuses it within it.
 bool IsDocumentType(const Reading &ours, const Reading &) {
   return Is(ours, "a document type declaration is not accepted");
 }
@@ -83,7 +83,7 @@ bool IsJudgedBeforeTheTagIsRead(const Reading &, const Reading &theirs) {
   return IsOfNamespaces(theirs);
 }
 
-/// That is before anything else is.
+/// We check the first four octets before all others.
 bool IsNullByteAtBeginning(const Reading &ours, const Reading &) {
   return Is(ours, "the document is UTF-16 or UTF-32, or begins with a null byte");
 }

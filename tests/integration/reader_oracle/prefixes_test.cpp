@@ -18,8 +18,8 @@
 
 namespace {
 
-// Of documents longer than the first number, a normal run reads only prefixes whose length is a multiple of the second
-// one.
+// Of documents with more than `LARGE` octets, a normal run reads only prefixes whose length is a multiple of
+// `LARGE_STEP`.
 constexpr std::size_t LARGE = 20'000;
 constexpr std::size_t LARGE_STEP = 211;
 
@@ -36,7 +36,7 @@ std::vector<std::string> AllDocuments() {
   return documents;
 }
 
-/// Whether a prefix of that length ends at "<" or ">", or is one of the others that a normal run reads too.
+/// Whether a normal run reads the prefix of `length` octets: it ends next to "<" or ">", or is one of some others.
 bool IsNearBoundary(std::string_view text, std::size_t length) {
   constexpr std::size_t STEP = 251;
   const std::size_t begin = length == 0 ? 0 : length - 1;
@@ -44,7 +44,7 @@ bool IsNearBoundary(std::string_view text, std::size_t length) {
 }
 
 TEST(PrefixesOfDocuments, AreReadAlikeByAllReaders) {
-  const bool isFull = Testing::Repetitions(true, false); // otherwise those at boundaries of markup, and some others
+  const bool isFull = Testing::Repetitions(true, false); // otherwise only those next to markup, and some others
   std::string former;
   std::size_t accepted = 0;
   for (const std::string &document : AllDocuments()) {

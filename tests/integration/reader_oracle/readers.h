@@ -12,14 +12,14 @@ namespace Testing {
 
 Reading ReadWithPlatform(std::string_view document);
 
-/// The platform's reader without the copy of the document that the parser above it makes.
+/// Like `ReadWithPlatform`, but without the parser, which would copy the document first.
 Reading ReadInPlace(std::string_view document);
 
 /// libxml2's SAX2 interface with namespaces. It refuses a document that is not well-formed or has a namespace error
 /// other than an unbound prefix. The declared encoding is ignored.
 Reading ReadWithLibxml2(std::string_view document);
 
-/// expat without namespaces, which rules written for this test check: code `NAMESPACE_FAULT`.
+/// expat without namespaces. Rules of this test check those, and refuse with the code `NAMESPACE_FAULT`.
 Reading ReadWithExpat(std::string_view document);
 
 /// expat's own reading of namespaces, which refuses an unbound prefix.

@@ -10,13 +10,13 @@ namespace Testing {
 
 namespace {
 
-/// Whether a document that ends just before the place of that refusal may be refused elsewhere.
+/// Whether a document that is cut at the place of `refusal` may be refused elsewhere. `before` is its reading.
 bool IsJudgedBefore(const Reading &refusal, const Reading &before) {
   // The first four octets are checked before all others.
   if (refusal.message == "the document is UTF-16 or UTF-32, or begins with a null byte; only UTF-8 is accepted") {
     return true;
   }
-  // Cut there, the target is reserved.
+  // What is left of the target is a reserved name.
   return refusal.message == "the target of a processing instruction has a colon" &&
          (before.message == "an XML declaration is not at the beginning of the document" ||
           before.message.ends_with("' is reserved and cannot be the target of a processing instruction"));

@@ -26,7 +26,7 @@ Part AnyPart(std::string_view text, RandomSource &random, std::size_t longest) {
   return {begin, std::min(1 + random.Below(longest), text.size() - begin)};
 }
 
-/// A range that ends where markup ends.
+/// A range from one delimiter to the next.
 Part AnyToken(std::string_view text, RandomSource &random) {
   const std::size_t begin = std::min(text.find_first_of("<>&;='\" ", random.Below(text.size())), text.size() - 1);
   const std::size_t end = std::min(text.find_first_of("<>&;='\" ", begin + 1), text.size());

@@ -11,8 +11,8 @@
 
 namespace Testing {
 
-/// One change to `text`: an octet or a bit changed, something removed, repeated, exchanged, inserted, or cut off, or a part of
-/// `other` put in.
+/// Makes one change to `text`: changes a bit or an octet, inserts an octet, removes, repeats or exchanges a part,
+/// inserts a part of `other`, or replaces the end by that of `other` or by nothing.
 void Mutate(std::string &text, std::string_view other, RandomSource &random);
 
 } // namespace Testing

@@ -1,5 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
-// No descriptor left. Each death test runs in its own process, whose first use of the network it is.
+// No descriptor left. Each death test runs in its own process, and begins with the first use of the network there.
 #include "outcome.h"
 
 #include "support/data_file.h"
@@ -50,7 +50,7 @@ int Resolve(const char *name, const char *service, const addrinfo *hints, addrin
 namespace Testing {
 namespace {
 
-/// Uses up the process's descriptors except for `spare` ones, during its lifetime.
+/// During its lifetime, only `spare` descriptors of the process are free.
 class UsedUpDescriptors {
 public:
   explicit UsedUpDescriptors(int spare) {
@@ -137,7 +137,7 @@ TEST(NoDescriptorDeathTest, FailsTheFirstUseOfTheNetworkButNoLaterOne) {
   std::_Exit(0);
 }
 
-TEST(NoDescriptorDeathTest, IsReportedByALaterUseAsItsReason) {
+TEST(NoDescriptorDeathTest, IsTheReasonThatALaterUseReports) {
   if (IS_SANITIZED) {
     GTEST_SKIP() << "UndefinedBehaviorSanitizer opens descriptors to check the type of an object";
   }

@@ -102,8 +102,8 @@ private:
   std::atomic<int> m_calls{0};
 };
 
-/// Calls `start` while allocation number `pieces`, counted from 0, is refused, there and on the platform's threads. The
-/// shortage lasts until `EndShortage`. Returns whether `start` threw.
+/// Calls `start`, and refuses allocation number `pieces`, counted from 0 in this call and on the platform's threads.
+/// The shortage lasts until `EndShortage`. Returns whether `start` threw.
 bool StartShortOfMemory(Shortage shortage, int pieces, const std::function<void()> &start) {
   g_piecesLeft = pieces;
   g_refused = 0;
@@ -125,9 +125,9 @@ int EndShortage() {
 }
 
 struct Attempt {
-  std::function<void(TcpClientSocket &)> prepare; ///< called with memory
+  std::function<void(TcpClientSocket &)> prepare; ///< called before the shortage
   std::function<void(TcpClientSocket &, Note &)> start;
-  std::function<void(TcpClientSocket &)> end; ///< called without memory
+  std::function<void(TcpClientSocket &)> end; ///< called during the shortage
 };
 
 /// Makes the attempt with each allocation refused in turn. Returns the messages of the failures; "" for a success.
@@ -230,7 +230,7 @@ TEST_P(WithoutMemory, CompletesAConnectOfAConnectionSpecOnce) {
   }
 }
 
-TEST_P(WithoutMemory, CompletesAConnectThatIsClosedOnce) {
+TEST_P(WithoutMemory, CompletesAClosedConnectOnce) {
   const FullPort full;
   const std::string host = "127.0.0.1";
   const std::set<std::string> messages =

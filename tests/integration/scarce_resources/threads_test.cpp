@@ -1,5 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
-// No thread left. Each test runs in its own process, whose first use of the network it is.
+// No thread left. Each test runs in its own process, and begins with the first use of the network there.
 #include "outcome.h"
 
 #include "support/data_file.h"

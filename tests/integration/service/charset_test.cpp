@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
-// A service that gets no charset, and so reads a request as ISO-8859-1 and answers in it: every operation still works
-// with texts beyond ASCII, and beyond ISO-8859-1.
+// A service that reads requests as ISO-8859-1, because they state no charset, and answers in it: every operation still
+// works with texts beyond ASCII, and beyond ISO-8859-1.
 #include "integration/service/service_client.h"
 #include "support/throws_message.h"
 #include "support/work_folder.h"
@@ -24,7 +24,7 @@ const char USERS[] =
     R"([{"name":"jürgen-ł-語-😀@grün.example","password":"pässword ł 語 😀","first":"Jürgen ł","last":"語 😀",
                           "groups":["größe-ł@grün.example","語-😀@grün.example"]}])";
 
-/// A service in that charset with only that user.
+/// A service that uses `charset` and has `USER` as its only user.
 class ServiceIn {
 public:
   explicit ServiceIn(const std::string &charset)
@@ -110,7 +110,7 @@ TEST_F(ServiceInLatin1, AcceptsATokenOfAServiceInUtf8AndViceVersa) {
   EXPECT_TRUE(otherClient->ValidateSubject(*held));
 }
 
-TEST(ServiceInWindows1252, IsRefusedByTheNameOfItsCharset) {
+TEST(ServiceInWindows1252, IsRefusedWithTheNameOfItsCharset) {
   const ServiceIn service("windows-1252");
   const TokenPtr token = ServiceClient()->AcquireToken(ALICE, PASSWORD, SpecFor(3600));
   EXPECT_THROWS_MESSAGE(ServiceClient("", service.GetUrl())->ValidateSubject(*token), SsoException,

@@ -20,7 +20,7 @@ using TokenPtr = std::shared_ptr<const SamlToken>;
 
 const char FULL_ADVICE[] = "https://advice.example/{colour=red,green;size=7} urn:more{no value=}";
 
-/// `fields`, changed as for a token that was requested with `FullSpec`.
+/// `fields` with the values of a token that was requested with `FullSpec`.
 ExpectedFields Full(ExpectedFields fields) {
   fields.lifetimeSec = 7200;
   fields.renewable = true;
@@ -30,7 +30,7 @@ ExpectedFields Full(ExpectedFields fields) {
   return fields;
 }
 
-/// The fields of alice's token, bound to the key of that identity.
+/// The fields of alice's token, bound to the key of `identity`.
 ExpectedFields Held(const std::string &identity) {
   ExpectedFields fields;
   fields.confirmation = identity;

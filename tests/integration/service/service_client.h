@@ -38,7 +38,7 @@ SsoClient::SecurityTokenServiceConfig ConfigFor(Tarvel::Ssl::SSLContext &context
 /// The library's service object, with the TLS context that it needs.
 class ServiceClient {
 public:
-  /// Bearer tokens only, without an identity.
+  /// Without an identity, the service issues only bearer tokens.
   explicit ServiceClient(const std::string &identity = "") : ServiceClient(identity, RunningService().GetUrl()) {}
   ServiceClient(const std::string &identity, const std::string &url);
 

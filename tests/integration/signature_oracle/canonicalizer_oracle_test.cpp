@@ -80,7 +80,7 @@ Form ChooseForm(Testing::RandomSource &random, std::string_view uri, std::size_t
   form.isPart = random.OnceIn(2);
   form.omits = random.OnceIn(4);
   form.apex = random.Below(elements);
-  // Not above the apex: then nothing would be left.
+  // An element above the apex is not omitted, because nothing would be left.
   const std::size_t lowest = form.isPart ? form.apex : 0;
   form.omitted = lowest + random.Below(elements - lowest);
   EXPECT_TRUE(Tarvel::Xml::Security::FindCanonicalMethod(uri, form.method));

@@ -53,7 +53,7 @@ struct Attribute {
 
 struct OpenElement {
   Namespaces inScope;
-  Namespaces written; // by the output's own ancestors and this element
+  Namespaces written; // declared in the output by this element and its ancestors
   std::vector<Attribute> xmlAttributes;
 };
 
@@ -221,7 +221,7 @@ private:
   const ExpatMethod &m_method;
   std::vector<OpenElement> m_open;
   std::size_t m_elements = 0;
-  std::size_t m_withinApex = 0;    // how many open elements are within it
+  std::size_t m_withinApex = 0;    // how many open elements are the apex or within it
   std::size_t m_withinOmitted = 0; // the same for the omitted subtree
   bool m_isRootWritten = false;
   bool m_hasUnboundPrefix = false;

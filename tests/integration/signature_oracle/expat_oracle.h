@@ -21,9 +21,9 @@ struct ExpatMethod {
 constexpr std::size_t NO_ELEMENT = static_cast<std::size_t>(-1);
 
 /// The canonical form (Canonical XML 1.0 or Exclusive XML Canonicalization 1.0) of the subtree at the element number
-/// `apex` (`NO_ELEMENT`: of the whole document) without the subtree at the element number `omitted` (`NO_ELEMENT`: with
-/// all). Elements are counted from 0 in document order. Nothing when expat refuses the document or a prefix is not
-/// bound.
+/// `apex`, without the subtree at the element number `omitted`. Elements are counted from 0 in document order. With
+/// `NO_ELEMENT`, `apex` means the whole document, and `omitted` that nothing is omitted. Returns nothing when expat
+/// refuses the document or a prefix is not bound.
 std::optional<std::string> CanonicalFormByExpat(std::string_view text, std::size_t apex, std::size_t omitted,
                                                 const ExpatMethod &method);
 

@@ -12,7 +12,7 @@ namespace {
 
 constexpr std::size_t MAX_ELEMENTS = 14;
 constexpr std::size_t MAX_DEPTH = 6;
-// The canonicaliser's buffer has 4096 octets, and its table of prefixes 128 places: some documents are beyond both.
+// The canonicaliser's buffer has 4096 octets, and its table of prefixes 128 places: some documents exceed one or both.
 constexpr std::size_t LONG_TEXT = 4080;
 constexpr std::size_t SPREAD_OF_LONG_TEXTS = 32;
 constexpr std::size_t MANY_PREFIXES = 17;
@@ -73,7 +73,7 @@ private:
   void WriteComment() {
     Put("<!--");
     PutPieces(COMMENT_PIECES);
-    Put("c-->"); // not a hyphen at its end
+    Put("c-->"); // so that no hyphen is at its end
   }
 
   void WriteInstruction() {

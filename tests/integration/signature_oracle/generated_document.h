@@ -15,8 +15,8 @@ namespace Testing {
 
 /// A well-formed document without a document type declaration: namespaces declared, declared again and undeclared,
 /// default namespaces, xml: attributes, CDATA sections, comments, processing instructions, references, carriage
-/// returns, characters of all lengths; some have texts of more than 4096 octets, and some more prefixes than 16 in
-/// scope. Each element has an attribute ID: "e0" for the document element, then "e1" and so on in document order.
+/// returns, characters of all lengths; some have texts of more than 4096 octets, and some have more than 16 prefixes
+/// in scope. Each element has an attribute ID: "e0" for the document element, then "e1" and so on in document order.
 struct GeneratedDocument {
   std::string text;
   std::size_t elements = 0;

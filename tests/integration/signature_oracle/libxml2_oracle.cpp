@@ -58,7 +58,7 @@ xmlNode *FindElement(xmlDoc &document, Predicate isWanted) {
 
 XmlDocHandle ParseWithLibxml2(std::string_view text) {
   static std::once_flag once;
-  std::call_once(once, [] { xmlSetGenericErrorFunc(nullptr, SayNothing); }); // refusals are expected by the hundred
+  std::call_once(once, [] { xmlSetGenericErrorFunc(nullptr, SayNothing); }); // hundreds of refusals are expected
   return XmlDocHandle(xmlReadMemory(text.data(), static_cast<int>(text.size()), nullptr, nullptr,
                                     XML_PARSE_NONET | XML_PARSE_NOENT | XML_PARSE_NOERROR | XML_PARSE_NOWARNING));
 }

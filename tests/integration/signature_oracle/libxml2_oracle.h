@@ -33,8 +33,8 @@ xmlNode *ElementOfLibxml2(xmlDoc &document, std::size_t index);
 /// The first element of that local name in document order, or null.
 xmlNode *ElementOfLibxml2(xmlDoc &document, std::string_view localName);
 
-/// Whether a namespace is declared anywhere whose name has no scheme. libxml2 then canonicalises no part of the
-/// document, whether or not the declaration is in that part.
+/// Whether the document declares a namespace name without a scheme anywhere. Then libxml2 canonicalises no part of the
+/// document, not even one without that declaration.
 bool HasRelativeNamespaceName(xmlDoc &document);
 
 struct OracleMethod {

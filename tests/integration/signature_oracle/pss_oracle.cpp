@@ -40,7 +40,7 @@ std::string TextOf(xmlNode *node) {
   return text;
 }
 
-/// The canonical form of `SignedInfo` by its own method, if that is a known one.
+/// The canonical form of `SignedInfo` by the method that it states; nothing when that method is not known.
 std::optional<std::string> CanonicalSignedInfo(xmlDoc &document) {
   xmlNode *const method = ElementOfLibxml2(document, "CanonicalizationMethod");
   const std::string uri = AttributeOf(method, "Algorithm");

@@ -1,7 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// RSA-PSS, which this version of the xmlsec1 library does not have: made of its digests, libxml2's canonical form of
-/// `SignedInfo`, and OpenSSL's signature.
+/// RSA-PSS, which this version of the xmlsec1 library does not have. `PssOracle` combines that library's digests,
+/// libxml2's canonical form of `SignedInfo`, and OpenSSL's signature.
 
 #pragma once
 

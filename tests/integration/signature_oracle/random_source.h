@@ -15,8 +15,8 @@ class RandomSource {
 public:
   explicit RandomSource(std::uint64_t seed) : m_engine(seed) {}
 
-  /// A number below `bound`, which must not be 0. Unlike the standard distributions, it is the same in
-  /// every library.
+  /// A number below `bound`, which must not be 0. Unlike a number of the standard distributions, it is the same with
+  /// every standard library.
   std::size_t Below(std::size_t bound) { return static_cast<std::size_t>(m_engine() % bound); }
 
   /// True once in `times`.

@@ -1,5 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
-// Signatures by others, changed or not, verified by them and by us; and our signatures, verified by them.
+// Signatures by other engines and by us, some of them changed. We and the other engines must reach the same verdict,
+// except where we are stricter.
 
 #include "generated_document.h"
 #include "pss_oracle.h"
@@ -175,7 +176,7 @@ const SignedBy ALGORITHMS[] = {
     {"EcdsaP256Sha384", Uri::ECDSA_SHA384, "sts-ec256", 15},
     {"EcdsaP256Sha512", Uri::ECDSA_SHA512, "sts-ec256", 16},
     {"EcdsaP384Sha384", Uri::ECDSA_SHA384, "sts-ec384", 17,
-     DOCUMENTS / 10}, // slow curve; another row has the algorithm
+     DOCUMENTS / 10}, // a slow curve; another row tests the algorithm more often
     {"EcdsaP521Sha512", Uri::ECDSA_SHA512, "sts-ec521", 18, DOCUMENTS / 10},
 };
 

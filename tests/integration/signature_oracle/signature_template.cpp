@@ -72,8 +72,8 @@ private:
     Close(element);
   }
 
-  // The signature is in the document element, so any reference but one to another element needs the transform that
-  // removes it.
+  // The signature is in the document element, so a reference to that element or to the document needs the transform
+  // that removes the signature.
   void WriteReference(std::size_t elements) {
     const std::size_t element = m_random.OnceIn(2) ? 0 : m_random.Below(elements);
     const bool isEnveloping = element == 0;
@@ -104,7 +104,7 @@ private:
 };
 
 /// A random place after a ">", but not where the text of a digest or signature value begins: we refuse a comment there,
-/// which others skip.
+/// but other engines skip it.
 std::size_t PlaceBehindTag(const std::string &text, RandomSource &random) {
   std::size_t at = text.find('>', random.Below(text.size()));
   while (at != std::string::npos) {

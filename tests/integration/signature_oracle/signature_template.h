@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// Signatures to be filled in for generated documents, and ways to change a signed document.
+/// Signature templates for generated documents, and changes to a signed document.
 
 #pragma once
 

@@ -25,7 +25,7 @@ void RequireXmlSec() {
     if (xmlSecInit() < 0 || xmlSecOpenSSLAppInit(nullptr) < 0 || xmlSecOpenSSLInit() < 0) {
       throw std::runtime_error("xmlsec1 does not start");
     }
-    xmlSecErrorsSetCallback(SayNothing); // refusals are expected by the thousand
+    xmlSecErrorsSetCallback(SayNothing); // thousands of refusals are expected
   });
 }
 

@@ -25,7 +25,7 @@ XmlSecKeyHandle LoadXmlSecKey(const std::string &path);
 /// succeeded.
 bool SignWithXmlSec(xmlDoc &document, const xmlSecKey &key);
 
-/// Whether the first `Signature` element of the document verifies. All errors count as no.
+/// Whether the first `Signature` element of the document verifies. False after an error, too.
 bool VerifiesWithXmlSec(xmlDoc &document, const xmlSecKey &key);
 
 /// The document as UTF-8 text.

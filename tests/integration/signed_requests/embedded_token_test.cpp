@@ -38,7 +38,7 @@ const Embedding EMBEDDINGS[] = {
 
 class EmbeddedToken : public testing::Test {
 protected:
-  /// The message of that operation with `xml` as its token.
+  /// The message of `embedding` with `xml` as its token.
   std::string Embed(const Embedding &embedding, const std::string &xml) const {
     const TokenStandIn token(AttributeOf(ForeignDocument(xml).Root(), "ID"), xml, SamlToken::HOLDER_OF_KEY);
     Request request;
@@ -53,7 +53,7 @@ protected:
     return IsValidSignature(Child(Assertion(document), "Signature"), ReadDataFile(certificate));
   }
 
-  /// The same, after the assertion was copied into its own document.
+  /// Like `IsValidIn`, but after the assertion was copied into its own document.
   static bool IsValidTakenOutOf(const std::string &message, const std::string &certificate) {
     const ForeignDocument document(message);
     const xmlDocPtr alone = xmlNewDoc(reinterpret_cast<const xmlChar *>("1.0"));
@@ -117,7 +117,7 @@ TEST_F(EmbeddedToken, KeepsItsSignatureInEveryMessageHoweverItIsWritten) {
 }
 
 /// Inclusive canonicalisation includes the declarations of all elements around the token, so its signature is not valid
-/// in a message that declares anything; and in a message, a reference to "" means the message. The service must copy
+/// in a message that declares anything. Also, a reference to "" means the whole message there. The service must copy
 /// these tokens into their own documents to verify them; there they are valid again.
 TEST_F(EmbeddedToken, OfInclusiveCanonicalisationIsValidAgainInItsOwnDocument) {
   for (const char *const name : {"c14n-inclusive", "c14n-inclusive-with-comments", "c14n-mixed",

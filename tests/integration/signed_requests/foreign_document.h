@@ -11,7 +11,7 @@
 
 namespace Testing {
 
-/// A parsed document whose identifiers ("Id", "ID" and "wsu:Id") references can resolve to.
+/// A parsed document. References in it can resolve to its identifiers ("Id", "ID" and "wsu:Id").
 class ForeignDocument {
 public:
   /// @throws std::runtime_error when libxml2 does not parse the text, or an identifier occurs twice.
@@ -45,7 +45,7 @@ std::vector<xmlNodePtr> Elements(xmlNodePtr root);
 std::string TextOf(xmlNodePtr node);
 std::string AttributeOf(xmlNodePtr element, const std::string &localName);
 
-/// Whether the signature element is valid for xmlsec1 with the key of that certificate (PEM or DER). A signature that
+/// Whether the signature element is valid for xmlsec1 with the key of `certificate` (PEM or DER). A signature that
 /// cannot be checked, for example because a reference does not resolve, is not valid.
 bool IsValidSignature(xmlNodePtr signature, const std::string &certificate);
 

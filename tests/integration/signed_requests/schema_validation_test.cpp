@@ -1,13 +1,13 @@
 // SPDX-License-Identifier: Apache-2.0
-// Validates each request against the schemas of its standards: those that Debian packages, and those in
+// Validates each request against the schemas of its standards: those in packages of Debian, and those in
 // tests/data/schemas.
 //
 // Every element of every request is valid. These differences from the standards remain, which the schemas do not
 // detect:
 // - wst:UseKey/@Sig is a plain identifier, although WS-Trust 1.3 requires a URI reference to the signature ("#...").
 //   As an xs:anyURI it is still valid.
-// - wst:BinaryExchange/@ValueType is the SPNEGO URI of the WS-Trust of February 2005: WS-Trust 1.3 leaves it open.
-// - wsse11:TokenType has "tokenprofile" where the SAML Token Profile 1.1 has "token-profile": the attribute is open.
+// - wst:BinaryExchange/@ValueType is the SPNEGO URI of WS-Trust of February 2005: WS-Trust 1.3 allows any URI.
+// - wsse11:TokenType has "tokenprofile", but the SAML Token Profile 1.1 has "token-profile". The schema allows any URI.
 // - an audience or an advice source that is not a URI is sent as it is, although its type in the schemas is xs:anyURI.
 //   The samples have URIs.
 #include "exchange/request_builder_impl.h"
@@ -47,7 +47,7 @@ public:
   Schemas() {
     xmlSetExternalEntityLoader(xmlNoNetExternalEntityLoader);
     const std::string path = DataPath("schemas/request.xsd");
-    std::string warnings; // there is one for each import that was imported already
+    std::string warnings; // there is one for each schema that is imported again
     const std::unique_ptr<xmlSchemaParserCtxt, decltype(&xmlSchemaFreeParserCtxt)> parser(
         xmlSchemaNewParserCtxt(path.c_str()), &xmlSchemaFreeParserCtxt);
     xmlSchemaSetParserErrors(parser.get(), Gather, Gather, &warnings);

@@ -16,7 +16,7 @@ namespace {
 
 using namespace Testing;
 
-/// All samples that are signed, and the operations that present a token again, with a genuine signed one.
+/// All signed samples, and an exchange and a renewal of a genuine token.
 std::vector<SampleRequest> SignedRequests() {
   std::vector<SampleRequest> samples;
   for (const SampleRequest &sample : SampleRequests()) {

@@ -28,7 +28,7 @@ TEST(StaticObjectThatJoinsAThread, WaitsForTheThreadsComputation) {
             "joined\n");
 }
 
-// Otherwise the request would wait four minutes for its response.
+// If it waited, the process would end only after four minutes, the time-out of the request.
 TEST(StaticObjectThatJoinsAThread, DoesNotWaitForAResponseOverTls) {
   std::promise<void> promise;
   const std::shared_future<void> requested = promise.get_future().share();

@@ -44,21 +44,21 @@ void PrintTo(const LargeDocument &document, std::ostream *out) {
   *out << document.name;
 }
 
-/// As many elements as are allowed, and something long at the end, which has `nodes` nodes and attributes. Because of a
-/// reference at the beginning, the reader makes its buffer when the rest of the document is longest.
+/// As many elements as are allowed, and then `end`, which is long and has `nodes` nodes and attributes. Because of the
+/// reference at the beginning, the reader makes its buffer when the unread rest of the document is longest.
 std::string WithElements(const std::string &end, std::size_t nodes) {
   return "<r>" + REFERENCE + Repeated("<a/>", MAX_NODES - 2 - nodes) + end + "</r>";
 }
 
 constexpr std::size_t LEFT_BESIDE_ELEMENTS = MAX_DOCUMENT_BYTES - 4 * MAX_NODES - 20;
 
-/// Decoded piece by piece, which makes a buffer grow.
+/// A text with many references, which is copied piece by piece.
 std::string DecodedInPieces() {
   const std::string piece = REFERENCE + std::string(1000, 'x');
   return Repeated(piece, LEFT_BESIDE_ELEMENTS / piece.size());
 }
 
-/// No other text of its length that needs decoding is longer after it.
+/// Of all texts of its length that need decoding, this one is the longest after decoding.
 std::string LongestDecoded() {
   return REFERENCE + std::string(LEFT_BESIDE_ELEMENTS - REFERENCE.size(), 'x');
 }
@@ -75,7 +75,7 @@ std::string WithAttribute() {
   return WithElements("<b c='" + LongestDecoded() + "'/>", 2);
 }
 
-/// The reader keeps a copy of the name as long as the element is open.
+/// The reader keeps a copy of the namespace name as long as the element is open.
 std::string WithDeclaration() {
   return WithElements("<b xmlns:c='" + LongestDecoded() + "'/>", 2);
 }
@@ -152,7 +152,7 @@ TEST_P(LargestDocuments, TakeABoundedPartOfTheHeapToParse) {
   EXPECT_TRUE(document);
 }
 
-TEST(LargestDocument, OfMoreNodesIsRefusedWithinThatPartOfTheHeap) {
+TEST(LargestDocument, WithTooManyNodesIsRefusedWithinABoundedPartOfTheHeap) {
   const std::string piece = "<a/>x";
   const std::string xml = "<r>" + Repeated(piece, MAX_DOCUMENT_BYTES / piece.size() - 2) + "</r>";
   const HeapCount heap;

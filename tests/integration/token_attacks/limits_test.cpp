@@ -59,7 +59,7 @@ TEST(Limits, DepthOf100000IsRefusedAtTheLimit) {
   const Counted counted = CountToken(Repeated("<x>", MANY) + Repeated("</x>", MANY));
   EXPECT_EQ("XMLParseException", counted.outcome.exceptionClass);
   EXPECT_EQ("elements are nested deeper than 256 at line 1, column 769", counted.outcome.text);
-  // Only the copy of the text and the 256 elements.
+  // Memory for the copy of the text and for the 256 elements only.
   EXPECT_LT(counted.octets, 7u * MANY * 4);
 }
 
@@ -131,7 +131,7 @@ TEST(Limits, AMillionInclusivePrefixesAreRefusedWithoutAListOfThem) {
       (Outcome{"InvalidSignatureException", "Signature verification error. The PrefixList of the algorithm "
                                             "\"http://www.w3.org/2001/10/xml-exc-c14n#\" has more than 256 prefixes"}),
       counted.outcome);
-  // Texts of the document's length, and no memory for each prefix.
+  // Memory for texts of the document's length, but not for each prefix.
   EXPECT_LT(counted.octets, 10 * list.size());
 }
 
@@ -146,7 +146,7 @@ TEST(Limits, OneHundredThousandGroupsAreReadAtACostInProportion) {
   EXPECT_LT(large.octets, small.octets * 150);
 }
 
-/// bearer-50k with its groups repeated up to about 5 MB, signed afresh by xmlsec1: too large to be kept as a file.
+/// bearer-50k with its groups repeated up to about 5 MB, and signed again by xmlsec1: too large to keep as a file.
 class LargeToken : public testing::Test {
 protected:
   void SetUp() override {

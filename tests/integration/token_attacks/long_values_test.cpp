@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
-// Values of 15 MiB in a document or in an argument: messages of the platform and lines of the log stay short, and so
-// does everything made of them, while the library's own messages about a token contain the whole value.
+// Values of 15 MiB in a document or in an argument: messages of the platform, lines of the log, and texts that contain
+// these stay short. The library's own messages about a token contain the whole value.
 
 #include "outcome.h"
 

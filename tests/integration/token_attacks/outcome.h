@@ -24,14 +24,14 @@ struct Outcome {
 
 std::ostream &operator<<(std::ostream &out, const Outcome &outcome);
 
-/// The service's certificates that the fixtures are signed with, one of each algorithm; not "other".
+/// The service's certificates, one for each kind and size of key that signs the fixtures; not "other".
 const Tarvel::Crypto::CertificateList &Trusted();
 
 /// The outcome for `xml` with those certificates and the default tolerance.
 Outcome TryToken(const std::string &xml);
 
 /// The outcome for the assertion number `index` (from 0, in document order) of the document `xml`.
-/// @throws std::out_of_range when there are fewer.
+/// @throws std::out_of_range when there are fewer assertions.
 Outcome TryElement(const std::string &xml, std::size_t index);
 
 /// A token fixture by its name without folder and extension.

@@ -66,8 +66,8 @@ protected:
   void SetUp() override { ASSERT_TRUE(m_genuine.IsAccepted()) << m_genuine; }
 
   /// Small tokens get every kind of change at every place. In large ones the kinds alternate, so that the sweep stays
-  /// short; under a sanitizer, where each costs many times as much and the same fuzz target runs too, they alternate in
-  /// all tokens.
+  /// short. Under a sanitizer they alternate in all tokens: each change costs many times as much there, and a fuzz
+  /// target makes such changes, too.
   bool IsTurn(std::size_t damage, std::size_t damages, std::size_t place) const {
     return (m_xml.size() < 2500 && !Testing::IS_SANITIZED) || place % damages == damage;
   }
@@ -121,7 +121,7 @@ TEST_P(Mutation, EachChunkDeletedOrDoubledNeverYieldsOtherFacts) {
   }
 }
 
-/// Where each element, including its content, begins and ends, found by the tags alone.
+/// Where each element, including its content, begins and ends; only the tags are read.
 std::vector<std::pair<std::size_t, std::size_t>> ElementRanges(const std::string &xml) {
   std::vector<std::pair<std::size_t, std::size_t>> ranges;
   std::vector<std::size_t> open;

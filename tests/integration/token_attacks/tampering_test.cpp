@@ -20,7 +20,7 @@ struct Change {
   const char *message = CHANGED;
 };
 
-// A change that no check before the signature notices ends in the signature's message.
+// A change without a class and a message here is noticed only by the check of the signature.
 const Change CHANGES[] = {
     {"Version", "Version=\"2.0\"", "Version=\"2.1\"", "ParseException", "Invalid token version"},
     {"Id", "ID=\"_", "ID=\"_0", "ParseException", "Token's signature must cover the entire token"},

@@ -85,7 +85,7 @@ TEST(TransportFromALargePool, HasAsManyRequestsInFlightAsTheCeilingAllows) {
   EXPECT_EQ(tally.WaitForAll(IN_FLIGHT), IN_FLIGHT);
 }
 
-/// Both ends of each connection are in this process: more than the usual soft limit of 1024 descriptors.
+/// Raises the soft limit on descriptors, which is usually 1024: both ends of each connection are in this process.
 void AllowDescriptors(rlim_t count) {
   rlimit limit{};
   ASSERT_EQ(::getrlimit(RLIMIT_NOFILE, &limit), 0);

@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
-// Each way in which a service, or the network before it, can misbehave. The right exception is thrown at once, not
-// after the time-out, and the same client works afterwards.
+// Each way in which a service, or the network on the way to it, can misbehave. The right exception is thrown at once,
+// not after the time-out, and the same client works afterwards.
 
 #include "integration/transport/service_stand_in.h"
 #include "system/name_lookup.h"

@@ -149,7 +149,7 @@ TEST(TransportTimeout, EndsALookupInTime) {
   release->set_value();
 }
 
-TEST(TransportTimeout, EndsTheRequestAtOnceWhenItIsNotPositive) {
+TEST(TransportTimeout, EndsTheRequestAtOnceWhenItIsTinyOrNotPositive) {
   for (const std::int64_t timeout : {std::int64_t(0), std::int64_t(-1), std::int64_t(1)}) {
     ServiceStandIn service([](ServerConnection &connection) { connection.Stall(); }, std::nullopt, timeout);
     const std::string outcome = AskForOutcome(*service.CreateSession());

@@ -31,7 +31,7 @@ using Tarvel::Ref;
 using Testing::DataPath;
 using Testing::ReadDataFile;
 
-// A step that waits for ever ends by a signal, before the server ends the connection, which it does after 30 seconds.
+// After this time, a signal ends a step that would wait for ever. The server ends its connections after 30 seconds.
 constexpr unsigned PATIENCE_SECONDS = 20;
 
 int g_port = 0;

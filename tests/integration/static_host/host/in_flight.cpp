@@ -55,7 +55,7 @@ int main() {
     const std::string outcome = Acquire("HTTPS");
     std::printf("worker: %s\n", outcome.c_str());
   });
-  // Answered when the worker's request has arrived.
+  // The service answers this request when the worker's request has arrived.
   const std::string outcome = Acquire("HTTP");
   std::printf("main: %s\n", outcome.c_str());
 }

@@ -1,5 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
-// Sets a variable by a call before main, which no file of the libraries may do.
+// Calls a function before main to set a variable. No file of the libraries may do this.
 #include <unistd.h>
 
 extern const pid_t INITIALISED_BEFORE_MAIN;

@@ -82,7 +82,7 @@ void Verify(const char *token, const Tarvel::Crypto::CertificateList &trusted) {
   Report(token, [&] { return SsoClient::CreateSamlToken(ReadData(token), trusted)->GetSubject().ToString(); });
 }
 
-/// Does only work that needs no key and no digest.
+/// Does work that needs neither a key nor a digest.
 void Compute(const TokenPtr &token) {
   Report("computed", [&] {
     std::promise<std::string> text;
