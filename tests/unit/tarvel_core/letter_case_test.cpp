@@ -104,7 +104,7 @@ TEST(StringUtilToUpper, DoesNotDependOnTheProcessLocale) {
   std::setlocale(LC_ALL, before.c_str());
 }
 
-TEST(StringUtilToUpper, LeavesTheProcessLocaleAlone) {
+TEST(StringUtilToUpper, DoesNotChangeTheProcessLocale) {
   const std::string before = std::setlocale(LC_ALL, nullptr);
   StringUtil::ToUpper("é");
   EXPECT_EQ(std::string(std::setlocale(LC_ALL, nullptr)), before);
