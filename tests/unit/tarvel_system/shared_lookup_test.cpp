@@ -27,8 +27,8 @@ using Testing::Eventually;
 using Testing::PATIENCE;
 using Testing::UnusedPort;
 
-/// Replaces the resolver. `Hold` makes the look-ups of a name wait until it is released. Each look-up returns the address
-/// 127.0.0.1, or fails with the message that `FailWith` has set.
+/// Replaces the resolver. `Hold` makes the look-ups of a name wait until it is released. Each look-up returns the
+/// address 127.0.0.1, or fails with the message that `FailWith` has set.
 class ResolverStandIn {
 public:
   ResolverStandIn()
