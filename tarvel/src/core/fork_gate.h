@@ -58,10 +58,11 @@ class ForkListener {
 public:
   /// Makes the threads of this object stop computing soon. Called on the forking thread, while others still compute.
   virtual void BeforeFork() noexcept = 0;
-  /// Called when no other thread computes.
+  /// Called when no other thread computes. Not called if `fork` stops waiting for that.
   virtual void AtFork() noexcept = 0;
+  /// Called in the parent, even if `AtFork` was not called.
   virtual void AfterForkInParent() noexcept = 0;
-  /// Called in the child, where there is no other thread.
+  /// Called in the child, where there is no other thread. Not called if `AtFork` was not called.
   virtual void AfterForkInChild() noexcept = 0;
 
 protected:

@@ -14,7 +14,7 @@ namespace Tarvel::Http {
 
 namespace {
 
-/// Headers that only the user agent sets. It never sends Transfer-Encoding and Expect. A second header of the same name
+/// Headers that only the user agent sets. It never sends Transfer-Encoding or Expect. A second header of the same name
 /// would make the message ambiguous.
 constexpr std::array<std::string_view, 7> OWN_HEADERS{
     "Accept-Encoding", "Connection", "Content-Length", "Cookie", "Host", "Transfer-Encoding", "Expect"};

@@ -23,7 +23,7 @@ namespace Tarvel::Http {
 namespace {
 
 constexpr std::size_t MAX_COOKIES = 50;        // the minimum for a domain by RFC 6265, section 6.1
-constexpr std::size_t MAX_COOKIE_BYTES = 4096; // also a minimum there, here for name and value together
+constexpr std::size_t MAX_COOKIE_BYTES = 4096; // the minimum for a cookie there; here for name and value together
 constexpr std::int64_t MICROSECONDS = 1000000; // in a second
 
 /// A cookie is sent only to the host that set it. A Domain attribute could extend that to a whole domain, but only a

@@ -95,7 +95,7 @@ public:
   static int OnNewSession(SSL *connection, SSL_SESSION *session) noexcept;
 
 private:
-  /// Called by OpenSSL for each message, before it is sent.
+  /// Called by OpenSSL for each message and each record's header; for a record to send, before it is sent.
   static void OnMessage(int, int, int, const void *, std::size_t, SSL *, void *connection) noexcept;
 
   ConnectionHandle MakeConnection(const ServerIdentity &identity, BIO *&received, BIO *&toSend);

@@ -111,7 +111,7 @@ TEST(StringWriter, KeepsWhatIsWrittenInOrder) {
   EXPECT_EQ(writer->GetText(), std::string("ab\0c", 4));
 }
 
-TEST(StringWriter, StartsAgainWithAnEmptyTextAfterTakeText) {
+TEST(StringWriter, IsEmptyAndReusableAfterTakeText) {
   const Ref<StringWriter> writer = CreateStringWriter();
   writer->Write("first");
   EXPECT_EQ(writer->TakeText(), "first");

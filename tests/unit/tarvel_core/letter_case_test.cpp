@@ -52,7 +52,7 @@ TEST(StringUtilToLower, MapsEverySigmaToTheCommonForm) {
   EXPECT_EQ(StringUtil::ToLower("ΣΑΣ"), "σασ");
 }
 
-TEST(StringUtilToUpper, LeavesCharactersThatAreNotLetters) {
+TEST(StringUtilToUpper, KeepsCharactersThatAreNotLetters) {
   const std::string text = "0123 \t~{}€漢字😀\x7F";
   EXPECT_EQ(StringUtil::ToUpper(text), text);
   EXPECT_EQ(StringUtil::ToLower(text), text);
