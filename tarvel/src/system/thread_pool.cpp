@@ -67,7 +67,7 @@ struct PoolState {
   std::condition_variable_any changed;
   WorkQueue queue;
   std::list<std::thread> threads;
-  std::list<std::thread> retired; // ended or about to end; the next thread that retires or the pool's destructor joins them
+  std::list<std::thread> retired; // ended or about to end; joined by the next thread that retires, or by the destructor
   std::size_t idle = 0;
   bool ended = false;
 };
