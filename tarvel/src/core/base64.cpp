@@ -12,7 +12,7 @@ namespace {
 constexpr std::string_view ALPHABET = "ABCDEFGHIJKLMNOPQRSTUVWXYZabcdefghijklmnopqrstuvwxyz0123456789+/";
 constexpr char PAD = '=';
 
-/// What a character means: its six bits, or one of these. Both have a bit set that no six-bit value has.
+/// The values of characters outside the alphabet. Each has a bit that no six-bit value has.
 constexpr std::uint8_t OTHER = 0x80;
 constexpr std::uint8_t BLANK = 0x40;
 
@@ -60,8 +60,8 @@ std::size_t DecodeFullGroups(std::string_view text, std::uint8_t *&out) noexcept
   return used;
 }
 
-/// Checks the text from its first pad on: exactly as many pads as a last group of `characters` needs, with blanks
-/// allowed between and after them, and nothing else.
+/// Checks the text from its first pad to its end: it must have exactly the pads that a last group of `characters`
+/// needs, and may have blanks between and after them, but nothing else.
 void RequirePadding(std::string_view text, std::size_t position, int characters) {
   if (characters < 2) {
     Refuse("misplaced padding", position);
@@ -79,7 +79,7 @@ void RequirePadding(std::string_view text, std::size_t position, int characters)
   }
 }
 
-/// The part that has been read of a group of four characters that blanks or the padding interrupt.
+/// The characters read so far of a group of four that blanks or the padding interrupt.
 struct PartialGroup {
   std::uint32_t bits = 0;
   int characters = 0;

@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// The environment that is in force, for the platform's own use.
+/// The environment that applies now, for the platform's own use.
 
 #pragma once
 
@@ -8,7 +8,8 @@
 
 namespace Tarvel {
 
-/// The innermost `ScopedEnvironment`'s, or null without one. It lives as long as that scope.
+/// The environment of the innermost `ScopedEnvironment`; null when there is no such scope. It is valid until that scope
+/// ends.
 const Environment *CurrentEnvironment() noexcept;
 
 } // namespace Tarvel

@@ -8,7 +8,7 @@
 
 namespace Tarvel {
 
-/// The type whose `std::type_info::name` is `name`; `name` itself when it is not a type's name.
+/// The readable name of the type whose `std::type_info::name` is `name`; `name` itself when it is not a type's name.
 std::string Demangle(const char *name);
 
 } // namespace Tarvel

@@ -18,12 +18,13 @@ namespace Tarvel {
 
 namespace {
 
-/// The most frames that are kept of a call stack: an exception is made far more often than its stack is read.
+/// The most frames of a call stack that an exception keeps: exceptions are made far more often than their stacks are
+/// read.
 constexpr std::size_t MAX_FRAMES = 32;
 
 using Address = boost::stacktrace::frame::native_frame_ptr_t;
 
-/// Whether `function` is, as text, the constructor of an exception class: "Space::SomeException::SomeException(…".
+/// Whether `function` is the name of an exception class's constructor: "Space::SomeException::SomeException(…".
 bool IsExceptionConstructor(std::string_view function) {
   constexpr std::string_view SUFFIX = "Exception";
   const std::string_view name = function.substr(0, function.find('('));
@@ -41,11 +42,11 @@ bool IsExceptionConstructor(std::string_view function) {
 
 struct Exception::State {
   State(const std::string &text, Address caller) : message(text) {
-    // Only addresses are recorded here; names are looked up when they are asked for.
+    // Only addresses are recorded here; names are looked up when a caller asks for them.
     const std::size_t written = boost::stacktrace::safe_dump_to(frames.data(), sizeof frames);
     const auto end = std::find(frames.begin(), frames.begin() + static_cast<std::ptrdiff_t>(written), nullptr);
     const auto first = std::find(frames.begin(), end, caller);
-    // Frames further in than the constructor's caller belong to the code that records the stack.
+    // The frames before that of the constructor's caller belong to the code that records the stack.
     begin = first == end ? 0 : static_cast<std::size_t>(first - frames.begin());
     count = static_cast<std::size_t>(end - frames.begin()) - begin;
   }
@@ -58,8 +59,7 @@ struct Exception::State {
   std::size_t count = 0;
 };
 
-// Never inlined: its return address is where the exception was made, or in the constructor of the class that derives
-// from it.
+// Never inlined, so that its return address is where the exception was made, or in the constructor of a derived class.
 __attribute__((noinline)) Exception::Exception(const std::string &message)
     : m_state(std::make_shared<const State>(message, __builtin_return_address(0))) {}
 

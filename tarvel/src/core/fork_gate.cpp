@@ -17,8 +17,8 @@ namespace Tarvel {
 namespace {
 
 constexpr std::chrono::microseconds WAIT_STEP{50};
-/// How many steps a thread waits that forks within its own computation. Others may wait for a lock that it holds, and
-/// would never end.
+/// The most steps that a thread waits when it forks within its own computation. Other threads may wait for a lock that
+/// it holds, and would never stop computing.
 constexpr int MAX_STEPS_WITHIN = 2000;
 
 /// The number of threads of one shard that compute: a single counter would be a point of contention.
@@ -37,8 +37,8 @@ std::mutex forks;     // held during a fork: there is one at a time
 bool isQuiet = false; // during a fork: no other thread computes
 std::atomic<bool> registers{false};
 
-thread_local unsigned depth = 0;           // of the computations that the thread has begun
-thread_local bool isForkingThread = false; // which never waits: all others wait for it
+thread_local unsigned depth = 0;           // how many computations the thread has begun
+thread_local bool isForkingThread = false; // that thread never waits: all others wait for it
 
 std::atomic<std::uint32_t> &OwnShard() noexcept {
   return shards[GetThreadShard(SHARDS)].threads;
@@ -68,14 +68,14 @@ std::uint32_t CountComputing() noexcept {
   return threads;
 }
 
-/// 1 when the calling thread computes, and so forks within its own computation: in a signal handler, or in a module
-/// that OpenSSL has loaded. Such a child executes another program.
+/// 1 when the calling thread computes, so that it forks within its own computation. This happens in a signal handler
+/// and in a module that OpenSSL has loaded. A child of such a fork is expected to execute another program.
 std::uint32_t CountOwn() noexcept {
   return depth > 0 ? 1 : 0;
 }
 
-/// One fork at a time. A thread that waits for its turn does not count as computing, or the fork under way would wait
-/// for it.
+/// Allows one fork at a time. A thread that waits for its turn does not count as computing: otherwise the fork under
+/// way would wait for it.
 void LockForks() noexcept {
   if (depth > 0) {
     EndComputing();

@@ -2,10 +2,10 @@
 /// @file
 /// Makes `fork` safe in a process that runs our threads: `fork` waits until no thread holds a lock.
 ///
-/// A child has only the thread that forked. A lock that another thread held at that moment, ours or one inside OpenSSL,
-/// stays locked there for ever. So each thread declares when it computes, `fork` waits until none does, and a thread
-/// that is about to begin waits for `fork`. A thread that waits for the network or runs the host's code does not count
-/// as computing.
+/// A child has only the thread that forked. A lock that another thread held at that moment, in our code or in
+/// OpenSSL, stays locked in the child for ever. So each thread declares when it computes, `fork` waits until no thread
+/// does, and a thread that is about to begin waits for `fork`. A thread that waits for the network or runs the host's
+/// code does not count as computing.
 
 #pragma once
 
@@ -13,8 +13,8 @@
 
 namespace Tarvel {
 
-/// While one exists, `fork` on another thread waits. One thread may have several at once. Do not hold one while you
-/// wait for the network, for another thread or for the host's code.
+/// While an object exists, `fork` on another thread waits. One thread may have several at once. Do not keep one
+/// while you wait for the network, for another thread or for the host's code.
 class Computation {
 public:
   Computation() noexcept;
@@ -23,8 +23,9 @@ public:
   ~Computation();
 };
 
-/// Surrounds a call of the host's function. While it exists, the calling thread does not count as computing, whatever
-/// it has begun, so that the host may fork there, or wait for a thread that forks. Our own locks must not be held.
+/// Surrounds a call of the host's function. While it exists, the calling thread does not count as computing, even
+/// within a `Computation`, so that the host may fork there, or wait for a thread that forks. The thread must hold none
+/// of our locks.
 class HostCall {
 public:
   HostCall() noexcept;
@@ -47,9 +48,9 @@ private:
   std::mutex m_mutex;
 };
 
-/// The number of forks between the process that first used the platform and this one. An object that was made under
-/// another number belongs to a parent: its threads do not exist here, and what it shares with the parent must not be
-/// touched.
+/// The number of forks between the process that first used the platform and this one. An object that was made when the
+/// number was another one belongs to a parent: its threads do not exist here, and what it shares with the parent must
+/// not be touched.
 unsigned GetForkGeneration() noexcept;
 
 /// Acts when the process forks.
@@ -57,10 +58,11 @@ class ForkListener {
 public:
   /// Makes the threads of this object stop computing soon. Called on the forking thread, while others still compute.
   virtual void BeforeFork() noexcept = 0;
-  /// Called when no other thread computes.
+  /// Called when no other thread computes. Not called if `fork` stops waiting for that.
   virtual void AtFork() noexcept = 0;
+  /// Called in the parent, even if `AtFork` was not called.
   virtual void AfterForkInParent() noexcept = 0;
-  /// Called in the child, where there is no other thread.
+  /// Called in the child, where there is no other thread. Not called if `AtFork` was not called.
   virtual void AfterForkInChild() noexcept = 0;
 
 protected:

@@ -43,10 +43,11 @@ char LowerAscii(char c) noexcept {
 
 struct CodePoint {
   wint_t value;
-  std::size_t length; ///< its bytes in UTF-8; 0 when the bytes there are not UTF-8
+  std::size_t length; ///< its bytes in UTF-8; 0 when the text is not UTF-8 there
 };
 
-/// The character at the start of `text`, by the well-formed byte sequences of RFC 3629: no overlong form, no surrogate.
+/// The character at the start of `text`. Only the well-formed byte sequences of RFC 3629 are accepted, without overlong
+/// forms and surrogates.
 CodePoint DecodeUtf8(std::string_view text) noexcept {
   constexpr CodePoint MALFORMED{0, 0};
   const auto byte = [text](std::size_t index) { return static_cast<unsigned char>(text[index]); };

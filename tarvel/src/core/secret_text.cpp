@@ -10,8 +10,8 @@
 
 namespace Tarvel {
 
-// `swap` copies a short text, which is inside the string object, and leaves its bytes there: so the source is
-// overwritten.
+// The bytes of a short text are inside the string object. `swap` copies them and leaves them in the source, so the
+// source is overwritten.
 SecretText::SecretText(std::string &&text) noexcept {
   m_text.swap(text);
   SecureWipe(text);
@@ -26,8 +26,8 @@ SecretText &SecretText::operator=(const SecretText &other) {
 SecretText &SecretText::operator=(SecretText &&other) noexcept {
   if (this != &other) {
     SecureWipe(m_text);
-    // Without memory of its own, `m_text` exchanges no pointer for a short text, whose bytes would then be out of
-    // reach.
+    // Frees the memory of `m_text`. Otherwise `swap` would move that memory to `other`, and the bytes of a short text
+    // would remain inside `other`, where `SecureWipe` does not reach them.
     std::string().swap(m_text);
     m_text.swap(other.m_text);
     SecureWipe(other.m_text);

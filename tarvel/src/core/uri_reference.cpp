@@ -14,14 +14,14 @@ namespace {
 
 constexpr std::size_t NPOS = std::string_view::npos;
 
-// What a character may be part of, one bit each. A "%" has none of them: it is valid where two hexadecimal digits
-// follow.
+// The parts of a URI that a character may be in, one bit each. A "%" has none of these bits: it is valid where two
+// hexadecimal digits follow.
 constexpr std::uint8_t ALPHA = 1U << 0U;
 constexpr std::uint8_t DIGIT = 1U << 1U;
 constexpr std::uint8_t HEX = 1U << 2U;
 constexpr std::uint8_t SCHEME = 1U << 3U;
 constexpr std::uint8_t NAME = 1U << 4U;  // a registered name: unreserved and sub-delims
-constexpr std::uint8_t USER = 1U << 5U;  // user information, and a later form of address
+constexpr std::uint8_t USER = 1U << 5U;  // user information, and an address of a later version
 constexpr std::uint8_t PATH = 1U << 6U;  // pchar and "/"
 constexpr std::uint8_t QUERY = 1U << 7U; // query and fragment
 
@@ -88,7 +88,7 @@ std::string_view Take(std::string_view &text, std::string_view stops) noexcept {
   return taken;
 }
 
-/// The scheme at the start of `text`, which is followed by a ":".
+/// The scheme at the start of `text`, without the ":" that ends it; `std::nullopt` when there is no scheme.
 std::optional<std::string_view> FindScheme(std::string_view text) noexcept {
   const std::size_t length = CountWhile(text, SCHEME);
   if (length == text.size() || text[length] != ':' || !Is(text.front(), ALPHA)) {
@@ -97,7 +97,7 @@ std::optional<std::string_view> FindScheme(std::string_view text) noexcept {
   return text.substr(0, length);
 }
 
-/// Sets the parts of `authority`. @return whether it is valid, an IP literal aside.
+/// Sets the parts of `authority`. @return whether it is valid; an IP literal is not checked.
 bool SplitAuthority(std::string_view authority, UriReference &parts) noexcept {
   if (const std::size_t at = authority.find('@'); at != NPOS) {
     parts.userInformation = authority.substr(0, at);
@@ -118,8 +118,8 @@ bool SplitAuthority(std::string_view authority, UriReference &parts) noexcept {
          ConsistsOfEscapedOr(parts.userInformation.value_or(""), USER);
 }
 
-/// Whether the path is valid. Without a scheme its first segment has no ":", which would end a scheme; after an
-/// authority that segment is empty.
+/// Whether the path is valid. Without a scheme, its first segment must not contain a ":", because that would end a
+/// scheme. After an authority the first segment is always empty.
 bool IsPath(const UriReference &parts) noexcept {
   const std::string_view first = parts.path.substr(0, parts.path.find('/'));
   return ConsistsOfEscapedOr(parts.path, PATH) && (parts.scheme || first.find(':') == NPOS);

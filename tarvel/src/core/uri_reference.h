@@ -30,8 +30,8 @@ std::optional<UriReference> SplitUriReference(std::string_view text) noexcept;
 /// Whether `host` is an IP literal: an IPv6 address or a later form (`v1.x`), in brackets. RFC 3986 has no zones.
 bool IsIpLiteral(std::string_view host) noexcept;
 
-/// Whether `text` is a URI reference (RFC 3986, section 4.1): a URI or a relative reference, which may be empty. An
-/// internationalised one is not: all characters of a URI are ASCII.
+/// Whether `text` is a URI reference (RFC 3986, section 4.1): a URI or a relative reference, which may be empty. A
+/// text with characters outside ASCII is not one.
 bool IsUriReference(std::string_view text) noexcept;
 
 } // namespace Tarvel

@@ -32,7 +32,7 @@ bool IsBeyondAscii(char c) noexcept {
   return static_cast<unsigned char>(c) > 0x7F;
 }
 
-/// Removes a parameter's value, a token or a quoted string, from the beginning of `rest`.
+/// Removes a parameter's value, a token or a quoted string, from the beginning of `rest`. @return the value.
 std::string TakeValue(std::string_view &rest) {
   std::string value;
   if (rest.empty() || rest.front() != '"') {
@@ -52,7 +52,7 @@ std::string TakeValue(std::string_view &rest) {
   return value;
 }
 
-/// The value of the encoding in the XML declaration that `text` begins with; empty when there is no such value.
+/// The encoding in the XML declaration at the start of `text`; empty when no encoding is declared.
 std::string_view FindDeclaredEncoding(std::string_view text) {
   constexpr std::string_view BEGINNING = "<?xml";
   std::string_view rest = text.substr(0, MAX_DECLARATION_LENGTH);

@@ -34,8 +34,8 @@ void Require(char c, char expected, const char *what) {
   }
 }
 
-/// For a line that is skipped. It must not contain a line feed alone, which an intermediary could take for the line's
-/// end.
+/// Refuses a control character in a line that is skipped: an intermediary could treat a line feed without a carriage
+/// return as the end of the line.
 void RequireText(char c) {
   if (IsControlCharacter(c) && c != '\t') {
     Refuse("a control character in an extension or the trailer");
@@ -86,7 +86,7 @@ void ChunkedBodyDecoder::TakeCharacter(char c, std::size_t bodyLength) {
     return;
   case Expected::DATA:
   case Expected::NOTHING:
-    return; // never called then: `Put` takes data in pieces, and takes nothing after the end
+    return; // not called in these states: `Put` handles data itself, and takes nothing after the end
   }
 }
 

@@ -14,7 +14,7 @@ namespace Tarvel::Http {
 class ChunkedBodyDecoder {
 public:
   /// Decodes `bytes`, appends the result to `body`, and returns how many bytes were used: all, unless the body ends
-  /// before.
+  /// within them.
   /// @throws HttpException when `bytes` are not in the chunked coding, or make `body` longer than `MAX_BODY_BYTES`.
   std::size_t Put(std::string_view bytes, std::string &body);
 

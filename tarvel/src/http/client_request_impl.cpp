@@ -14,7 +14,8 @@ namespace Tarvel::Http {
 
 namespace {
 
-/// Headers that the user agent sets itself; a second one of the same name would make the message ambiguous.
+/// Headers that only the user agent sets. It never sends Transfer-Encoding or Expect. A second header of the same name
+/// would make the message ambiguous.
 constexpr std::array<std::string_view, 7> OWN_HEADERS{
     "Accept-Encoding", "Connection", "Content-Length", "Cookie", "Host", "Transfer-Encoding", "Expect"};
 
@@ -47,7 +48,7 @@ std::string SerialiseHeader(const RequestData &request, std::string_view host, s
   }
   AppendHeader(header, "Accept-Encoding", "identity");
   AppendHeader(header, "Connection", "close");
-  // RFC 9110, section 8.6: no length without a body, if the method does not normally have one.
+  // RFC 9110, section 8.6: a request without a body states a length only if its method normally has a body.
   const std::size_t bodyLength = request.body.Get().size();
   if (bodyLength > 0 || request.method == "POST" || request.method == "PUT") {
     AppendHeader(header, "Content-Length", std::to_string(bodyLength));

@@ -14,7 +14,7 @@
 
 namespace Tarvel::Http {
 
-/// A request without what depends on the connection.
+/// The parts of a request that do not depend on the connection.
 struct RequestData {
   std::string method;
   std::string target; ///< path and query
@@ -33,8 +33,8 @@ public:
   void SetHeader(std::string_view name, std::string_view value) override;
   void WriteBody(std::string_view bytes) override;
 
-  /// Moves everything out, for the start of the request.
-  /// @throws InvalidStateException when that was done before.
+  /// Moves the data out when the request starts.
+  /// @throws InvalidStateException when the request has been started before.
   RequestData Take();
 
 private:

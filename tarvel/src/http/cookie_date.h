@@ -10,8 +10,8 @@
 
 namespace Tarvel::Http {
 
-/// The date in `text` as microseconds since 1970, UTC, read as leniently as RFC 6265, section 5.1.1, says; nullopt when
-/// there is no date in it.
+/// The date in `text` as microseconds since 1970, UTC, by the lenient rules of RFC 6265, section 5.1.1; nullopt when
+/// `text` contains no date.
 std::optional<std::int64_t> ParseCookieDate(std::string_view text);
 
 } // namespace Tarvel::Http

@@ -23,12 +23,12 @@ namespace Tarvel::Http {
 namespace {
 
 constexpr std::size_t MAX_COOKIES = 50;        // the minimum for a domain by RFC 6265, section 6.1
-constexpr std::size_t MAX_COOKIE_BYTES = 4096; // also that minimum, for name and value together
+constexpr std::size_t MAX_COOKIE_BYTES = 4096; // the minimum for a cookie there; here for name and value together
 constexpr std::int64_t MICROSECONDS = 1000000; // in a second
 
 /// A cookie is sent only to the host that set it. A Domain attribute could extend that to a whole domain, but only a
 /// list that is kept up to date can say whether a domain is a public suffix such as "co.uk". A user agent sends to one
-/// host and does not need the list.
+/// host only and needs no cookies of other hosts.
 struct Cookie {
   std::string name;
   std::string value;
@@ -97,7 +97,7 @@ private:
   std::vector<Cookie> m_cookies; // in the order of their creation
 };
 
-// Whether the connection is secure does not matter here (RFC 6265, section 5.3); it matters for what is sent back.
+// Whether the connection is secure does not matter here (RFC 6265, section 5.3); it matters when cookies are sent back.
 void CookieStoreImpl::SetFromHeader(std::string_view setCookie, std::string_view host, std::string_view path, bool) {
   const std::optional<SetCookie> parsed = ParseSetCookie(setCookie);
   if (!parsed || parsed->name.size() + parsed->value.size() > MAX_COOKIE_BYTES ||
@@ -139,7 +139,7 @@ std::string CookieStoreImpl::GetHeader(std::string_view host, std::string_view p
       toSend.push_back(&cookie);
     }
   }
-  // Longer paths first, and older ones before newer (RFC 6265, section 5.4).
+  // Longer paths first; of equally long ones, older cookies before newer ones (RFC 6265, section 5.4).
   std::stable_sort(toSend.begin(), toSend.end(),
                    [](const Cookie *left, const Cookie *right) { return left->path.size() > right->path.size(); });
   std::string header;

@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// The exception that is being handled, in a form that completions can be given.
+/// The exception that is being handled, in a form that can be passed to completions.
 
 #pragma once
 
@@ -11,13 +11,13 @@
 
 namespace Tarvel::Http {
 
-/// The exception for memory that ran out. It is made at the first call, so that later calls need no memory.
+/// The exception for a lack of memory. It is made at the first call, so that later calls need no memory.
 const std::shared_ptr<const Exception> &OutOfMemory();
 
-/// To be called while an exception is being handled. A `Tarvel::Exception` is returned in its own class. For
+/// Must be called while an exception is being handled. A `Tarvel::Exception` is copied with its own class. For
 /// `std::bad_alloc`, and for an exception that cannot be copied for lack of memory, `OutOfMemory()` is returned, which
 /// must have been called before. Anything else becomes an InvalidStateException about the request to `endpoint`, with
-/// the foreign text.
+/// its text.
 std::shared_ptr<const Exception> CurrentFailure(const std::string &endpoint) noexcept;
 
 } // namespace Tarvel::Http

@@ -18,10 +18,10 @@ using HeaderFields = std::vector<std::pair<std::string, std::string>>;
 
 bool IsControlCharacter(char c) noexcept;
 
-/// A method or a header's name: one or more letters, digits and !#$%&'*+-.^_`|~
+/// Whether `text` may be a method or a header's name: one or more letters, digits and !#$%&'*+-.^_`|~
 bool IsToken(std::string_view text) noexcept;
 
-/// A text without control characters, so that it cannot end a line.
+/// Whether `text` contains no control characters, so that it cannot end a line.
 bool IsFieldValue(std::string_view text) noexcept;
 
 /// `text` without the blanks and tabs around it.

@@ -31,7 +31,7 @@ std::string DescribeSeconds(std::chrono::microseconds time) {
   return text + " seconds";
 }
 
-/// The Host header (RFC 9110, section 7.2): an IPv6 address in brackets, and a port that is not the scheme's own.
+/// The Host header (RFC 9110, section 7.2): an IPv6 address in brackets, and the port unless it is the scheme's own.
 std::string MakeHostHeader(const ConnectionSpec &spec, bool isSecure) {
   std::string host = spec.GetHost();
   if (host.find(':') != std::string::npos && host.front() != '[') {
@@ -88,7 +88,7 @@ void HttpExchange::Start() {
   }
 }
 
-/// Ends the exchange without a report, if its connect has not ended.
+/// Ends the exchange without calling the completion function, if its connect has not ended. @return whether it did.
 bool HttpExchange::Abandon() noexcept {
   UserAgent::CompletionFunction completion; // destroyed outside the lock
   const std::lock_guard<ForkSafeMutex> lock(m_mutex);
@@ -123,12 +123,11 @@ void HttpExchange::OnConnected(const Ref<System::Stream> &stream, const Exceptio
       throw InvalidStateException("A connection specification reported neither a stream nor a failure");
     }
     Send(stream);
+    // At once: a server that refuses a request may answer, and end the connection, before it has read the request.
     Read(stream);
   });
 }
 
-// Reading begins at once: a server that refuses a request may answer, and end the connection, before it has read the
-// request.
 void HttpExchange::Send(const Ref<System::Stream> &stream) {
   m_isSecure = stream->IsSecure();
   m_message = Serialise(m_request, MakeHostHeader(*m_spec, m_isSecure),
@@ -186,8 +185,8 @@ void HttpExchange::OnRead(std::size_t count, const Exception *failure) {
   }
 }
 
-/// The kernel reports a reset only once. If the write got it, the read sees an orderly end. So an end of the connection
-/// that delimits the body is accepted only if the write succeeded.
+/// The kernel reports a reset only once. If the write got that report, the read sees an orderly end. So an end of the
+/// connection that delimits the body is accepted only if the write succeeded.
 void HttpExchange::OnEnd() {
   {
     const std::lock_guard<ForkSafeMutex> lock(m_mutex);
@@ -251,7 +250,7 @@ std::shared_ptr<const Exception> HttpExchange::Cancelled() const noexcept {
   }
 }
 
-/// Without a failure and a response, the request was cancelled.
+/// If both `failure` and `response` are null, the request was cancelled.
 void HttpExchange::Finish(std::shared_ptr<const Exception> failure, const Ref<ClientResponse> &response) noexcept {
   Ref<System::Stream> stream;
   UserAgent::CompletionFunction completion;
@@ -272,7 +271,7 @@ void HttpExchange::Finish(std::shared_ptr<const Exception> failure, const Ref<Cl
     stream->Close();
   }
   Complete(completion, failure.get(), response);
-  completion = nullptr; // releases what it captures before the waiters wake
+  completion = nullptr; // releases what it captures before the waiting threads continue
   {
     const std::lock_guard<ForkSafeMutex> lock(m_mutex);
     m_failure = failure;

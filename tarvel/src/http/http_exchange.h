@@ -30,13 +30,13 @@ public:
   HttpExchange(const Ref<ConnectionSpec> &spec, const Ref<CookieStore> &cookies, RequestData request,
                UserAgent::CompletionFunction completion);
 
-  /// To be called once. When it throws, the completion function has not been called and never will be.
+  /// Must be called once. If it throws, the completion function has not been called and never will be.
   void Start();
 
-  /// Waits, on this thread alone, until the completion function has run.
-  /// @throws System::TimeoutException after the time-out, when the request has been cancelled; System::NetworkException
-  ///         at once in a child of the process that started the request, unless the request was done before; otherwise
-  ///         the exception that the request failed with.
+  /// Blocks only the calling thread, until the completion function has run.
+  /// @throws System::TimeoutException after the time-out, which cancels the request; System::NetworkException at once
+  ///         in a child of the process that started the request, unless the request was done before; otherwise the
+  ///         exception that the request failed with.
   Ref<ClientResponse> Wait(std::chrono::microseconds timeout);
 
   /// Does nothing in a child of the process that started the request: there the request counts as done.
@@ -44,7 +44,7 @@ public:
   bool IsDone() const noexcept override;
 
 private:
-  static constexpr std::size_t BUFFER_BYTES = 16 * 1024; // a TLS record
+  static constexpr std::size_t BUFFER_BYTES = 16 * 1024; // the content of one TLS record
 
   ~HttpExchange() override;
 
@@ -59,7 +59,7 @@ private:
   void FinishResponse();
   void KeepCookies(const ResponseData &response);
 
-  /// Calls the reader. Its exception gets the endpoint into its message.
+  /// Runs `call`, which calls the reader, and adds the endpoint to the message of the reader's exception.
   void ParseWithContext(const std::function<void()> &call) const;
   /// Runs one step; an exception ends the exchange with that failure.
   template <typename Call>
@@ -78,7 +78,7 @@ private:
   const Ref<CookieStore> m_cookies;
   const std::string m_endpoint; // for messages
 
-  // Used by one step at a time, so without a lock. The message is kept until it is written.
+  // Each is used by one step at a time, so without a lock. The message is kept until it is written.
   RequestData m_request;
   SecretText m_message;
   std::array<char, BUFFER_BYTES> m_buffer; // as secret as the response

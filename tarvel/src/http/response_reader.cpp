@@ -23,7 +23,7 @@ using boost::beast::error_code;
 
 namespace {
 
-/// More than any server needs. A server that sends nothing else is refused.
+/// More than any server needs. A server that sends only interim responses is refused.
 constexpr int MAX_INTERIM_RESPONSES = 16;
 
 constexpr int SWITCHING_PROTOCOLS = 101;
@@ -49,7 +49,7 @@ void CheckBodyLength(std::uint64_t length) {
   throw HttpException("its header is not HTTP/1.x (" + reason + ")");
 }
 
-/// A server of another protocol would never send the end of a header, so its first bytes are checked.
+/// A server of another protocol may never send the end of a header, so its first bytes are checked.
 void CheckBeginning(std::string_view header) {
   constexpr std::string_view BEGINNING = "HTTP/1.";
   const std::size_t length = std::min(header.size(), BEGINNING.size());
@@ -66,7 +66,7 @@ bool IsInterim(int status) noexcept {
   return status / 100 == 1 && status != SWITCHING_PROTOCOLS;
 }
 
-/// Whether the status is the whole answer: a body is not read.
+/// Whether the status alone is the answer, so that no body is read.
 bool IsRefusal(int status) noexcept {
   return status / 100 != 2 && status != INTERNAL_SERVER_ERROR && !IsInterim(status);
 }
@@ -133,8 +133,8 @@ private:
   std::size_t on_chunk_body_impl(std::uint64_t, boost::beast::string_view, error_code &) override { return 0; }
   void on_finish_impl(error_code &) override {}
 
-  /// RFC 9112, section 6.1: a body in an unknown coding cannot be read, and a coding together with a length is an
-  /// attempt at request smuggling.
+  /// RFC 9112, section 6.1: a body in an unknown coding cannot be read, and a coding together with a length may
+  /// be an attempt at request smuggling.
   void CheckTransferCodings() const {
     if (m_transferCodings == 0) {
       return;
@@ -175,8 +175,8 @@ void ResponseReader::Put(std::string_view bytes) {
   }
 }
 
-/// Uses all bytes, or those up to the header's end. The header is parsed when it is complete, so that the result does
-/// not depend on the pieces in which it arrives.
+/// Uses all bytes, or those up to the header's end; returns how many. The header is parsed when it is complete, so that
+/// the result does not depend on the pieces in which it arrives.
 std::size_t ResponseReader::PutHeader(std::string_view bytes) {
   constexpr std::string_view END = "\r\n\r\n";
   const std::size_t known = m_pendingHeader.size();
@@ -226,7 +226,7 @@ void ResponseReader::FinishHeader() {
   }
 }
 
-/// RFC 9112, section 6.3, for the statuses whose body is read.
+/// Decides how the body ends (RFC 9112, section 6.3), for the statuses whose body is read.
 void ResponseReader::ChooseBody() {
   const int status = m_header->GetData().status;
   const bool isChunked = m_header->IsChunked();
@@ -249,7 +249,7 @@ void ResponseReader::ChooseBody() {
   m_stage = m_length == 0 ? Stage::COMPLETE : Stage::BODY_OF_LENGTH;
 }
 
-/// Every request says that it accepts no coding. Without this check, encoded content would be taken for text.
+/// Every request says that it accepts no coding. Without this check, encoded content would be treated as text.
 void ResponseReader::CheckContentCoding() const {
   for (const auto &[name, value] : m_data.fields) {
     if (EqualsIgnoringCase(name, "Content-Encoding") && !value.empty() && !EqualsIgnoringCase(value, "identity")) {
@@ -259,7 +259,7 @@ void ResponseReader::CheckContentCoding() const {
   }
 }
 
-/// Uses all bytes, or those up to the body's end.
+/// Uses all bytes, or those up to the body's end; returns how many.
 std::size_t ResponseReader::PutBody(std::string_view bytes) {
   std::string &body = m_data.body;
   if (m_stage == Stage::BODY_IN_CHUNKS) {

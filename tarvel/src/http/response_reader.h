@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// From the bytes of a connection to one whole response.
+/// Reads one whole response from the bytes of a connection.
 
 #pragma once
 
@@ -16,14 +16,14 @@
 
 namespace Tarvel::Http {
 
-/// The body is secret, and wiped at the end. It is not a `SecretText`, because a reader gives it away as a string,
-/// without a copy of what may be 16 MiB.
+/// The body is secret, and the destructor wipes it. It is not a `SecretText`, because a reader hands it over as a
+/// string, without a copy of what may be 16 MiB.
 struct ResponseData {
   ResponseData() = default;
   ResponseData(const ResponseData &) = delete;
   ResponseData &operator=(const ResponseData &) = delete;
   ResponseData(ResponseData &&) noexcept = default;
-  ResponseData &operator=(ResponseData &&) noexcept = default; ///< only to one without a body, which would not be wiped
+  ResponseData &operator=(ResponseData &&) noexcept = default; ///< the old body must be empty: it is not wiped
   ~ResponseData();
 
   int status = 0;
@@ -34,10 +34,11 @@ struct ResponseData {
 
 class ResponseHeaderParser;
 
-/// Reads the final response to one request, in pieces of any size, and skips interim ones (1xx but 101). It is strict
-/// where leniency would let two parties read the same bytes differently, or take a part for the whole. With a status
-/// other than 2xx and 500 the response is complete after its header, whatever that says about a body. Messages of its
-/// exceptions are half sentences about the response. After an exception it must not be used again.
+/// Reads the final response to one request, in pieces of any size, and skips interim ones (1xx except 101). It is
+/// strict where leniency would let two parties read the same bytes differently, or treat a part as the whole. With a
+/// status other than 2xx and 500 the response is complete after its header, whatever the header says about a body. The
+/// messages of its exceptions are parts of sentences, which the caller completes. After an exception it must not be
+/// used again.
 class ResponseReader {
 public:
   /// @param answersHead whether the request's method is HEAD, so that no body follows whatever the header says.
@@ -51,7 +52,7 @@ public:
   /// @throws HttpException when the bytes are not a response, contradict themselves, or are over a limit.
   void Put(std::string_view bytes);
 
-  /// To be called at the orderly end of the connection, which is how a body without a length ends.
+  /// Must be called at the orderly end of the connection, which also ends a body without a length.
   /// @throws HttpException when the response is not complete then.
   void PutEnd();
 
@@ -60,7 +61,7 @@ public:
   /// Whether the response is complete when the connection ends.
   bool EndsWithConnection() const noexcept { return m_stage == Stage::BODY_TO_END; }
 
-  /// The response that was read. To be called once, when it is complete.
+  /// The response that was read. Must be called once, when the response is complete.
   ResponseData Take();
 
 private:

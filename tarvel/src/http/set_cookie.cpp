@@ -13,7 +13,7 @@ namespace Tarvel::Http {
 
 namespace {
 
-/// Name and value of "name=value", blanks around both dropped; the value is empty when there is no "=".
+/// Name and value of "name=value", without the blanks around them; the value is empty when there is no "=".
 std::pair<std::string_view, std::string_view> Split(std::string_view pair) {
   const std::size_t equals = pair.find('=');
   if (equals == std::string_view::npos) {
@@ -37,7 +37,7 @@ std::optional<std::int64_t> ParseMaxAge(std::string_view text) {
   if (digits.empty() || !std::all_of(digits.begin(), digits.end(), [](char c) { return c >= '0' && c <= '9'; })) {
     return std::nullopt;
   }
-  constexpr std::int64_t LIMIT = std::numeric_limits<std::int32_t>::max(); // 68 years, longer than any process
+  constexpr std::int64_t LIMIT = std::numeric_limits<std::int32_t>::max(); // 68 years, longer than any process runs
   std::int64_t seconds = 0;
   for (const char digit : digits) {
     seconds = std::min(seconds * 10 + (digit - '0'), LIMIT);
@@ -71,7 +71,8 @@ std::optional<SetCookie> ParseSetCookie(std::string_view text) {
   std::string_view rest = text;
   const std::string_view first = TakePiece(rest);
   const auto [name, value] = Split(first);
-  // Name and value are sent back in a header, which they must not end. A tab is allowed between the pieces.
+  // Name and value are sent back in a header, so they must not contain control characters. `Split` has removed tabs
+  // around them.
   const bool isClean = IsFieldValue(name) && IsFieldValue(value);
   if (first.find('=') == std::string_view::npos || name.empty() || !isClean) {
     return std::nullopt;

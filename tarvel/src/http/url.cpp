@@ -95,7 +95,7 @@ std::optional<int> ReadNumber(std::string_view digits) noexcept {
   return number;
 }
 
-/// Does not check the text in the brackets of an address and the range of the port, which have messages of their own.
+/// Does not check the text in the brackets of an address and the range of the port: their failures have other messages.
 UriReference Parse(std::string_view url) {
   const std::optional<UriReference> parts = SplitUriReference(url);
   if (!parts || (parts->port && !ReadNumber(*parts->port))) {
@@ -129,7 +129,7 @@ void CheckIPv6Address(std::string_view url, const std::string &host) {
   }
 }
 
-/// Why `label` is not a valid part of a host name; empty when it is one.
+/// Why `label` is not a valid part of a host name; empty when it is valid.
 std::string RefuseLabel(std::string_view label) {
   if (label.empty()) {
     return "the host name has an empty part";
@@ -150,7 +150,7 @@ bool LooksLikeNumber(std::string_view label) {
 void CheckHostName(std::string_view url, const std::string &host) {
   std::string_view rest = host;
   if (rest.size() > 1 && rest.back() == '.') {
-    rest.remove_suffix(1); // the root
+    rest.remove_suffix(1); // the dot of the root
   }
   if (rest.size() > MAX_HOST_LENGTH) {
     Refuse(url, "the host name is longer than 253 characters");

@@ -50,7 +50,7 @@ public:
 };
 
 int OpenForReading(const std::string &path) {
-  // To the system a path is a C string: what follows a NUL would be ignored silently.
+  // The system reads a path as a C string, and would silently ignore what follows a NUL.
   if (path.find('\0') != std::string::npos) {
     // NOLINTNEXTLINE(readability-redundant-string-cstr): the message shows the path up to its NUL.
     ThrowFor("open", path.c_str(), EINVAL);

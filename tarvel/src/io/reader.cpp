@@ -14,7 +14,7 @@ namespace {
 
 constexpr std::size_t CHUNK_LENGTH = 16 * 1024;
 
-/// Memory for one read, which is overwritten at the end.
+/// Memory for one read. The destructor overwrites it.
 struct Chunk {
   Chunk() = default;
   Chunk(const Chunk &) = delete;
@@ -41,7 +41,7 @@ public:
   }
 
 private:
-  SecretText m_text; // perhaps a response with a token in it
+  SecretText m_text; // may be a response that contains a token
   std::size_t m_position = 0;
 };
 

@@ -15,7 +15,7 @@ public:
   std::string TakeText() override { return m_text.Take(); }
 
 private:
-  SecretText m_text; // perhaps a request with a password in it
+  SecretText m_text; // may be a request that contains a password
 };
 
 } // namespace

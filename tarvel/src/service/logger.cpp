@@ -29,7 +29,7 @@ public:
     try {
       m_root->Write({m_name, level, StringUtil::Shorten(message, StringUtil::MAX_LINE_BYTES)});
     } catch (const std::bad_alloc &) {
-      // The line is lost, but the operation that it reports goes on.
+      // The line is lost, but the operation that it reports continues.
     }
   }
 

@@ -42,7 +42,7 @@ void LogUncaughtException(std::string_view place) noexcept {
   try {
     LogInternal(PlatformLogger(), LEVEL_WARNING, "An exception left %1: %2", place, DescribeCurrentException());
   } catch (...) {
-    // Out of memory while logging: the line is lost, but the thread goes on.
+    // Out of memory while logging: the line is lost, but the thread continues.
   }
 }
 

@@ -25,7 +25,7 @@ void Completions::Run() const noexcept {
     CallGuarded(m_handshake, m_handshakeFailure.get());
   }
   for (const Transfer *transfer : {&m_write, &m_read}) {
-    // A handler may have forked: in the child none of the others is called.
+    // A handler may have forked: the child must not call the others.
     if (transfer->handler && generation == GetForkGeneration()) {
       CallGuarded(transfer->handler, transfer->count, transfer->failure.get());
     }

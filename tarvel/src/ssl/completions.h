@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// Calls of completion handlers, made without a lock and without letting an exception through.
+/// Calls completion handlers while no lock is held. Their exceptions are logged and ignored.
 
 #pragma once
 
@@ -25,7 +25,7 @@ void CallGuarded(const Handler &handler, const Args &...args) noexcept {
 }
 
 /// Handlers whose operations have ended, collected under the stream's lock and called after it is released. `Run` calls
-/// each once, with its result.
+/// each handler once, with its result.
 class Completions {
 public:
   using Failure = std::shared_ptr<const Exception>;

@@ -56,7 +56,7 @@ std::string NormaliseThumbprint(std::string_view text) {
 }
 
 /// The name as it is written in certificates. They contain neither a scope, which selects an interface of this machine,
-/// nor a final dot, which is for the resolver.
+/// nor a final dot, which matters only to the resolver.
 std::string NormaliseHost(std::string_view host) {
   if (host.size() > 2 && host.front() == '[' && host.back() == ']') {
     host = host.substr(1, host.size() - 2);

@@ -18,25 +18,25 @@ public:
   ///         empty; the message is the reason.
   ServerIdentity(const std::string &host, const std::string &parameter);
 
-  /// Sets the server name to send, and the name that the verification of the chain checks.
+  /// Sets the server name to send, and the name that OpenSSL checks when it verifies the chain.
   /// @throws SSLException, OutOfMemoryException
   void Apply(SSL *connection) const;
 
-  /// Whether the thumbprint replaces the checks of chain and name.
+  /// Whether the thumbprint is checked instead of the chain and the name.
   bool HasThumbprint() const noexcept { return !m_thumbprint.empty(); }
 
   /// Why `certificate` (may be null) does not have the thumbprint; empty when it does.
   /// @throws Crypto::CryptoException, OutOfMemoryException
   std::string RefuseByThumbprint(X509 *certificate) const;
 
-  /// The text is the same for two identities exactly when their checks are the same.
+  /// A text for comparison: identities with the same text send the same server name and make the same checks.
   std::string ToKey() const { return m_host + '\n' + m_thumbprint; }
 
 private:
   void ApplyName(SSL *connection) const;
 
   std::string m_host;       // lower case, without brackets, scope and final dot
-  std::string m_thumbprint; // lower-case digits; empty when there is none
+  std::string m_thumbprint; // lower-case digits; empty when the name is checked
   bool m_isAddress = false;
 };
 

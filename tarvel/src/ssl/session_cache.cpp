@@ -14,10 +14,10 @@ namespace Tarvel::Ssl {
 namespace {
 
 constexpr std::size_t MAX_SESSIONS = 512;
-/// So many connections to one endpoint can be open at once and all have resumed a session.
+/// This many connections to one endpoint can be open at the same time, each with a resumed session.
 constexpr std::size_t MAX_SESSIONS_PER_KEY = 64;
 
-/// Whether the session can be resumed and its server's certificate is still valid, which a resumed handshake does not
+/// Whether the session can be resumed and its server's certificate has not expired, which a resumed handshake does not
 /// check.
 bool IsUsable(const SSL_SESSION *session) {
   if (SSL_SESSION_is_resumable(session) != 1) {
@@ -27,7 +27,7 @@ bool IsUsable(const SSL_SESSION *session) {
   if (age < 0 || age >= SSL_SESSION_get_timeout(session)) {
     return false;
   }
-  // The function only reads, though its type does not say so.
+  // The function only reads the session, although its parameter is not const.
   const X509 *const certificate = SSL_SESSION_get0_peer(const_cast<SSL_SESSION *>(session));
   return certificate && X509_cmp_current_time(X509_get0_notAfter(certificate)) > 0;
 }
@@ -40,7 +40,7 @@ void SessionCache::Put(const std::string &key, SessionHandle session) {
   Entries entry;
   entry.push_back(Entry{key, std::move(session)});
   m_byKey.emplace(key, entry.begin());
-  m_entries.splice(m_entries.end(), entry); // so the session is in both containers or, without memory, in neither
+  m_entries.splice(m_entries.end(), entry); // never throws: if memory runs out, neither container has the session
   if (m_byKey.count(key) > MAX_SESSIONS_PER_KEY) {
     const auto oldest = m_byKey.lower_bound(key);
     m_entries.erase(oldest->second);

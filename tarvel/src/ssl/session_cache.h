@@ -15,7 +15,7 @@
 namespace Tarvel::Ssl {
 
 /// Recent sessions by key. The key contains the endpoint and everything that its certificate was checked for, because a
-/// resumed session is not checked again. Safe on any thread.
+/// resumed handshake does not verify the certificate again. Safe on any thread.
 class SessionCache {
 public:
   SessionCache() = default;
@@ -25,13 +25,13 @@ public:
   /// Adds `session`. When there are too many, the oldest is removed.
   void Put(const std::string &key, SessionHandle session);
 
-  /// Removes and returns the newest usable session; null when there is none. So no two connections use a session at the
-  /// same time, and a ticket of TLS 1.3 is used only once (RFC 8446, appendix C.4).
+  /// Removes and returns the newest usable session; null when there is none. So two connections never use a session at
+  /// the same time, and a ticket of TLS 1.3 is used only once (RFC 8446, appendix C.4).
   SessionHandle Take(const std::string &key);
 
   void Clear();
 
-  /// Forgets the sessions without freeing them, once OpenSSL has cleaned itself up.
+  /// Forgets the sessions without freeing them. Called after OpenSSL has cleaned itself up.
   void Abandon() noexcept;
 
   std::size_t GetSize();
@@ -43,8 +43,8 @@ private:
   };
   using Entries = std::list<Entry>;
 
-  /// To be called under the lock. A child process begins with an empty cache, because only the parent uses its
-  /// sessions.
+  /// Must be called under the lock. A child process begins with an empty cache, because only the parent uses the
+  /// parent's sessions.
   void ForgetThoseOfParent();
 
   mutable ForkSafeMutex m_mutex;                         // guards all members below

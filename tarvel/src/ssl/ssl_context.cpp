@@ -32,11 +32,11 @@ void RequireSuccess(long result, const Crypto::OpenSslErrorScope &errors, const 
   }
 }
 
-/// The OpenSSL object of `certificate`, ready for use by many connections at once: OpenSSL decodes the extensions at
-/// the first use, under a lock, so they are decoded here, before any connection could wait for that.
+/// The OpenSSL object of `certificate`, ready for use by many connections at once. OpenSSL decodes the extensions under
+/// a lock when it first uses them. They are decoded here, so that no connection waits for that lock.
 X509 *Prepare(const Crypto::Certificate &certificate) {
   X509 *const native = Crypto::AsImpl(certificate).GetNative();
-  X509_check_purpose(native, -1, 0); // bad extensions are reported again by verification
+  X509_check_purpose(native, -1, 0); // bad extensions are ignored here; verification reports them
   return native;
 }
 
@@ -80,7 +80,7 @@ SSLContextImpl::~SSLContextImpl() {
   m_native.reset();
 }
 
-// Does not use OpenSSL's default paths, because environment variables can change them.
+// Does not let OpenSSL choose its default paths, because environment variables can change that choice.
 void SSLContextImpl::TrustSystemStore() {
   const Crypto::OpenSslGuard use;
   use.Require();

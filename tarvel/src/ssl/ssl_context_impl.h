@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// The one implementation of `SSLContext`, over OpenSSL's.
+/// The one implementation of `SSLContext`, with an `SSL_CTX` of OpenSSL.
 
 #pragma once
 

@@ -65,7 +65,7 @@ void SSLStreamImpl::AsyncHandshake(const std::string &host, const std::string &p
   }
   std::string ownHost = host;
   std::string ownParameter = parameter;
-  PostPump(); // the last call that may fail; what it posts waits for the lock
+  PostPump(); // the last call that may fail; the step that it posts waits for the lock
   m_stage = Stage::HANDSHAKING;
   m_host = std::move(ownHost);
   m_parameter = std::move(ownParameter);
@@ -122,7 +122,8 @@ void SSLStreamImpl::Close() noexcept {
   m_lower->Close();
 }
 
-/// The notice is sent only if the stream below takes it at once.
+/// Sends TLS's closing notice, unless a write is under way below. It is lost if the stream below does not accept it at
+/// once.
 void SSLStreamImpl::SendClosingNotice() noexcept {
   if (m_stage != Stage::ESTABLISHED || m_lowerWrites) {
     return;
@@ -135,8 +136,9 @@ void SSLStreamImpl::SendClosingNotice() noexcept {
   }
 }
 
-/// Completes what is pending, after the stream has failed. If there is no memory to post that, the end of the operation
-/// below does it: while something is pending, there is such an operation, or this has been posted.
+/// Posts a step that completes the pending operations after the stream has failed. If there is no memory to post it, an
+/// earlier step or the end of an operation below completes them: while an operation is pending here, one of these is
+/// pending, too.
 void SSLStreamImpl::CompletePendingSoon() noexcept {
   if (!m_handshake && !m_read && !m_write) {
     return;
@@ -144,7 +146,7 @@ void SSLStreamImpl::CompletePendingSoon() noexcept {
   try {
     PostPump();
   } catch (...) {
-    // The operation below does it, as said above.
+    // An earlier step or the operation below completes them.
   }
 }
 

@@ -55,25 +55,25 @@ private:
 
   ~SSLStreamImpl() override;
 
-  /// What went wrong below; nullopt without a failure.
+  /// Why an operation of the stream below failed; nullopt when it succeeded.
   using LowerFailure = std::optional<std::string>;
 
   /// Whether this is a child's copy of its parent's stream. Only the parent uses the connection and calls the handlers.
   bool IsOfParent() const noexcept { return m_generation != GetForkGeneration(); }
 
   void PostPump();
-  /// Runs `step` under the lock, or fails what is pending once OpenSSL is gone; then calls the handlers. An exception
-  /// from `step` ends the stream.
+  /// Runs `step` under the lock, then calls the handlers. After OpenSSL has cleaned itself up, fails the pending
+  /// operations instead of running `step`. An exception from `step` ends the stream.
   template <typename Step>
   void Advance(const Step &step) noexcept;
-  /// The same on an I/O thread. A stream below that is not the platform's may call back on another thread.
+  /// Calls `Advance` on an I/O thread. A stream below that is not the platform's may call back on another thread.
   template <typename Step>
   void AdvanceOnIoThread(Step step) noexcept;
-  /// Called when OpenSSL cleans itself up. Closes the stream below, which wakes a read that waits for a silent server.
+  /// Called when OpenSSL cleans itself up. Closes the stream below, so that a read that waits for a silent server ends.
   static void OnOpenSslEnd(void *stream) noexcept;
 
   // All functions below are called under the lock. Steps that return a bool return whether they wait for bytes from
-  // below.
+  // the stream below.
   void Pump(Completions &done);
   bool StepHandshake(Completions &done);
   void StepWrite(Completions &done);
@@ -87,14 +87,14 @@ private:
   void SendClosingNotice() noexcept;
   void CompletePendingSoon() noexcept;
 
-  /// Whether OpenSSL waits for bytes, after a step that is not DONE. If not, the stream has failed.
+  /// Called after a step that is not DONE. Returns whether OpenSSL waits for bytes. If not, the stream has failed.
   bool WaitsForBytes(Progress progress, Completions &done);
-  /// Each of these ends the stream for good: pending and later operations fail.
+  /// `Fail` and `FailWith` end the stream: pending and later operations fail.
   void Fail(const std::string &reason, Completions &done) noexcept;
   void FailWith(Failure failure, Completions &done) noexcept;
-  /// The same, but a later step completes what is pending.
+  /// Ends the stream, too, but a later step completes the pending operations.
   void MarkFailed(Failure failure) noexcept;
-  /// The same once OpenSSL is gone.
+  /// Like `MarkFailed`, after OpenSSL has cleaned itself up.
   void MarkEnded() noexcept;
   Failure MakeFailure(const std::string &reason) const;
   Failure MakeFailureOrNoMemory(const char *reason) const noexcept;
@@ -109,7 +109,7 @@ private:
   ForkSafeMutex m_mutex; // guards all members below; never held while a handler runs
   Stage m_stage = Stage::FRESH;
   Failure m_failure;
-  std::string m_host; // of the handshake; the endpoint before it
+  std::string m_host; // of the handshake; before it, the endpoint
   std::string m_parameter;
   TlsConnection m_tls;
 

@@ -20,13 +20,13 @@ namespace Tarvel::Ssl {
 
 namespace {
 
-/// One record of TLS, whole (RFC 8446, section 5.2).
+/// The largest TLS record, with its header (RFC 8446, section 5.2).
 constexpr std::size_t INPUT_BYTES = 5 + TlsConnection::RECORD_BYTES + 256;
-/// More is encrypted only once the stream below has taken what is ready, so that a large message is not held a second
-/// time.
+/// Nothing is encrypted while this many bytes wait for the stream below, so that a large message is not in memory a
+/// second time.
 constexpr std::size_t MAX_OUTPUT_BYTES = 4 * TlsConnection::RECORD_BYTES;
 
-/// What went wrong below; nullopt without a failure.
+/// Why an operation of the stream below failed; nullopt when it succeeded.
 std::optional<std::string> DescribeLowerFailure(const Exception *exception) noexcept {
   if (!exception) {
     return std::nullopt;
@@ -40,7 +40,8 @@ std::optional<std::string> DescribeLowerFailure(const Exception *exception) noex
 
 } // namespace
 
-// Always on an I/O thread: OpenSSL has an error queue for each thread, and those of the host's threads may have entries.
+// Always runs on an I/O thread: OpenSSL has an error queue for each thread, and those of the host's threads may have
+// entries.
 void SSLStreamImpl::PostPump() {
   boost::asio::post(System::GetIoContext(),
                     [self = Ref(this)] { self->Advance([&self](Completions &done) { self->Pump(done); }); });
@@ -78,13 +79,13 @@ void SSLStreamImpl::AdvanceOnIoThread(Step step) noexcept {
     const Computation computing;
     boost::asio::dispatch(System::GetIoContext(), [self = Ref(this), step = std::move(step)] { self->Advance(step); });
   } catch (...) {
-    // On this thread, because there is no memory to go to an I/O thread.
+    // On this thread, because there is no memory to post to an I/O thread.
     Advance([](Completions &) { throw OutOfMemoryException(); });
   }
 }
 
-// Another thread may be releasing the last reference, so this must not take one. While anything is pending, an
-// operation below or a posted step holds a reference.
+// Another thread may be releasing the last reference, so this function must not take one. While an operation is
+// pending, an operation below or a posted step has a reference, and completes it.
 void SSLStreamImpl::OnOpenSslEnd(void *stream) noexcept {
   auto &self = *static_cast<SSLStreamImpl *>(stream);
   {
@@ -202,7 +203,7 @@ void SSLStreamImpl::StartLowerRead() {
                            self->AdvanceOnIoThread([self, count, failure = DescribeLowerFailure(exception)](
                                                        Completions &done) { self->OnLowerRead(count, failure, done); });
                          });
-  m_lowerReads = true; // its end waits for the lock
+  m_lowerReads = true; // `OnLowerRead` waits for the lock
 }
 
 void SSLStreamImpl::OnLowerRead(std::size_t count, const LowerFailure &failure, Completions &done) {

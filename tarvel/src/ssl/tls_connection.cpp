@@ -17,7 +17,8 @@ namespace Tarvel::Ssl {
 
 namespace {
 
-/// Of one connection. A server that issues more wants them used by as many connections at once.
+/// The most sessions that are kept of one connection. A server issues several so that as many connections can resume at
+/// the same time.
 constexpr std::size_t MAX_NEW_SESSIONS = 8;
 
 std::string DescribeSubject(X509 *certificate) {
@@ -44,7 +45,7 @@ void TlsConnection::Begin(const std::string &host, const std::string &parameter)
   ConnectionHandle connection = MakeConnection(*m_identity, received, toSend);
   m_sessionKey = m_endpoint + '\n' + m_identity->ToKey();
   if (const SessionHandle session = m_context->GetSessions().Take(m_sessionKey)) {
-    SSL_set_session(connection.get(), session.get()); // if it does not fit, the handshake is a full one
+    SSL_set_session(connection.get(), session.get()); // if OpenSSL cannot use it, the handshake is a full one
   }
   m_received = received;
   m_toSend = toSend;
@@ -90,7 +91,7 @@ bool TlsConnection::WasResumed() const noexcept {
   return SSL_session_reused(m_connection.get()) == 1;
 }
 
-// Up to TLS 1.2 a session can be resumed again and again, and the server need not give a new one.
+// Up to TLS 1.2 a session can be resumed many times, and the server need not issue a new one.
 void TlsConnection::KeepResumedSession() {
   if (WasResumed() && m_newSessions.empty() && SSL_version(m_connection.get()) == TLS1_2_VERSION) {
     KeepSession(SessionHandle(SSL_get1_session(m_connection.get())));
@@ -112,7 +113,7 @@ TlsConnection::Progress TlsConnection::Encrypt(const char *bytes, std::size_t le
   if (result == 1) {
     return Progress::DONE;
   }
-  // A buffer in memory takes every byte, so OpenSSL has no reason to wait.
+  // A buffer in memory accepts every byte, so OpenSSL has no reason to wait.
   errors.RequireMemory();
   m_reason = errors.Describe("the bytes cannot be encrypted");
   return Progress::FAILED;
@@ -123,7 +124,7 @@ TlsConnection::Progress TlsConnection::Examine(int result, const Crypto::OpenSsl
   if (error == SSL_ERROR_WANT_READ) {
     return Progress::NEEDS_BYTES;
   }
-  m_newSessions.clear(); // not to be resumed after a fatal alert (RFC 8446, section 6.2)
+  m_newSessions.clear(); // must not be resumed after a fatal alert (RFC 8446, section 6.2)
   if (m_lacksMemory) {
     throw OutOfMemoryException();
   }
@@ -136,7 +137,7 @@ TlsConnection::Progress TlsConnection::Examine(int result, const Crypto::OpenSsl
   return Progress::FAILED;
 }
 
-// What was verified in the handshake is checked here again, because a resumed handshake verifies nothing.
+// Checks again what a full handshake has verified, because a resumed handshake verifies nothing.
 std::string TlsConnection::RefuseServer() const {
   const Crypto::CertificateHandle certificate(SSL_get1_peer_certificate(m_connection.get()));
   if (m_identity->HasThumbprint()) {
@@ -149,7 +150,7 @@ std::string TlsConnection::RefuseServer() const {
   return {};
 }
 
-// Before OpenSSL sends an alert, it resets the errno that `malloc` has set.
+// Looks at the errno that `malloc` has set, because OpenSSL resets it before it sends an alert.
 void TlsConnection::OnMessage(int, int, int, const void *, std::size_t, SSL *, void *connection) noexcept {
   if (errno == ENOMEM) {
     static_cast<TlsConnection *>(connection)->m_lacksMemory = true;
@@ -160,7 +161,7 @@ int TlsConnection::OnVerifyServer(X509_STORE_CTX *verification, void *) noexcept
   const auto *const native =
       static_cast<SSL *>(X509_STORE_CTX_get_ex_data(verification, SSL_get_ex_data_X509_STORE_CTX_idx()));
   auto *const self = static_cast<TlsConnection *>(SSL_get_app_data(native));
-  // A certificate that was read without enough memory for all of it is refused, but for another reason.
+  // If memory ran out while the certificate was read, verification refuses it, but for another reason.
   const bool lacksMemory = errno == ENOMEM;
   try {
     try {

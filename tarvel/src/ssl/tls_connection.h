@@ -1,6 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// One TLS connection as OpenSSL sees it: the protocol between two buffers in memory, and the verdict on the server.
+/// One TLS connection of OpenSSL: the protocol between two buffers in memory, and the decision whether the server is
+/// accepted.
 
 #pragma once
 
@@ -17,14 +18,14 @@
 
 namespace Tarvel::Ssl {
 
-/// Used under its stream's lock; on the I/O threads alone, except for its end. Until `Begin` has returned there is no
-/// connection, and only `IsBegun`, `PrepareSteps`, `End` and `Abandon` may be called.
+/// Used under its stream's lock, and only on the I/O threads, except that any thread may end it. Until `Begin` has
+/// returned there is no connection, and only `IsBegun`, `PrepareSteps`, `End` and `Abandon` may be called.
 class TlsConnection {
 public:
-  /// What a step of the protocol came to. The reason for FAILED is `TakeReason`.
+  /// The outcome of a step of the protocol. After FAILED, `TakeReason` returns the reason.
   enum class Progress { DONE, NEEDS_BYTES, FAILED };
 
-  /// A record's content (RFC 8446, section 5.1): what one `Encrypt` takes at most.
+  /// The most content of one record (RFC 8446, section 5.1), and so the most that one `Encrypt` encrypts.
   static constexpr std::size_t RECORD_BYTES = 16384;
 
   /// @param endpoint a part of the key under which sessions are remembered.
@@ -33,7 +34,7 @@ public:
   TlsConnection &operator=(const TlsConnection &) = delete;
   ~TlsConnection() = default;
 
-  /// Makes the connection. There is none when it throws.
+  /// Makes the connection. If it throws, there is no connection.
   /// @param host as in `SSLStream::AsyncHandshake`.
   /// @param parameter as in `SSLStream::AsyncHandshake`.
   /// @throws SSLException; the message is the reason. @throws OutOfMemoryException
@@ -41,7 +42,7 @@ public:
 
   bool IsBegun() const noexcept { return m_connection != nullptr; }
 
-  /// Forgets what earlier steps left in the thread's error queue. To be called before the steps of one turn.
+  /// Clears what earlier steps left in the thread's error queue. Must be called before a series of steps.
   void PrepareSteps() noexcept;
 
   /// Continues the handshake. DONE means that the server was accepted.
@@ -72,33 +73,33 @@ public:
   /// How many encrypted bytes are ready for the stream below.
   std::size_t GetOutputSize() const noexcept;
 
-  /// Moves at most `maximum` of these bytes to `output`, in place of what it held.
+  /// Moves at most `maximum` of these bytes to `output`, whose content they replace.
   void TakeOutput(std::vector<char> &output, std::size_t maximum);
 
   void DropOutput() noexcept;
 
-  /// Keeps OpenSSL from taking an established connection that ends now for a broken one, whose session is not
-  /// resumable. Errors that do make the session invalid are recorded by OpenSSL itself.
+  /// Keeps the session of an established connection resumable when the connection ends now: OpenSSL would treat it as
+  /// broken. OpenSSL itself records the errors that do make the session invalid.
   void KeepResumable() noexcept;
 
   /// Frees the connection.
-  /// @param remembersSessions whether its sessions go into the context's cache. If not, they are freed.
+  /// @param remembersSessions whether its sessions are put into the context's cache. If not, they are freed.
   void End(bool remembersSessions) noexcept;
 
-  /// Leaves everything unfreed, once OpenSSL has cleaned itself up.
+  /// Forgets everything without freeing it. Called after OpenSSL has cleaned itself up.
   void Abandon() noexcept;
 
-  /// For OpenSSL: whether the server's certificate is accepted (1) or not (0).
+  /// Called by OpenSSL. Returns whether the server's certificate is accepted (1) or not (0).
   static int OnVerifyServer(X509_STORE_CTX *verification, void *) noexcept;
-  /// For OpenSSL: offers a session for keeping; 1 when its reference was taken over.
+  /// Called by OpenSSL with a new session. Returns 1: this function has taken over the reference.
   static int OnNewSession(SSL *connection, SSL_SESSION *session) noexcept;
 
 private:
-  /// For OpenSSL: shows each message, before it is sent.
+  /// Called by OpenSSL for each message and each record's header; for a record to send, before it is sent.
   static void OnMessage(int, int, int, const void *, std::size_t, SSL *, void *connection) noexcept;
 
   ConnectionHandle MakeConnection(const ServerIdentity &identity, BIO *&received, BIO *&toSend);
-  /// Why OpenSSL's call, which returned `result`, did not end with success.
+  /// Finds out why a call of OpenSSL, which returned `result`, did not succeed.
   Progress Examine(int result, const Crypto::OpenSslErrorScope &errors);
   /// Why the server is refused; empty when it is accepted.
   std::string RefuseServer() const;
@@ -111,13 +112,13 @@ private:
   std::string m_sessionKey;
   std::string m_reason;
   std::string m_verifyFailure;
-  bool m_lacksMemory = false; // as far as it has been noticed within OpenSSL
+  bool m_lacksMemory = false; // whether a callback of OpenSSL has noticed a lack of memory
 
   ConnectionHandle m_connection;
   // Oldest first. Kept out of the cache until the connection is freed: OpenSSL modifies these sessions without locking.
   std::vector<SessionHandle> m_newSessions;
-  BIO *m_received = nullptr; // owned by m_connection: from below, still encrypted
-  BIO *m_toSend = nullptr;   // owned by m_connection: for below, encrypted
+  BIO *m_received = nullptr; // owned by m_connection: encrypted bytes from the stream below
+  BIO *m_toSend = nullptr;   // owned by m_connection: encrypted bytes for the stream below
 };
 
 } // namespace Tarvel::Ssl

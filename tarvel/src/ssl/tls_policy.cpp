@@ -19,8 +19,8 @@ constexpr int MIN_VERSION = TLS1_2_VERSION;
 /// 112 bits: RSA and DH from 2048 bits, curves from 224, no SHA-1 in signatures.
 constexpr int MIN_SECURITY_LEVEL = 2;
 
-/// Of TLS 1.2. Each connection has a fresh key, so that an attacker that gets the server's key later cannot read what
-/// was recorded. Authenticated encryption comes first; CBC is for servers that offer nothing else.
+/// The suites of TLS 1.2. Each connection has a fresh key, so that an attacker that gets the server's key later cannot
+/// read what was recorded. Authenticated encryption is first; CBC is for servers that offer nothing else.
 constexpr const char *CIPHERS = "ECDHE+AESGCM:ECDHE+CHACHA20:DHE+AESGCM:DHE+CHACHA20:ECDHE+AES:DHE+AES:"
                                 "!aNULL:!eNULL:!aDSS:!AESCCM:!PSK:!SRP";
 constexpr const char *CIPHERS_OF_TLS_1_3 = "TLS_AES_256_GCM_SHA384:TLS_CHACHA20_POLY1305_SHA256:TLS_AES_128_GCM_SHA256";
@@ -44,7 +44,7 @@ void Require(bool isSet, const Crypto::OpenSslErrorScope &errors, const char *fa
   }
 }
 
-/// Does what OpenSSL's macros do; these require a list that is not constant.
+/// Does what OpenSSL's macros do, with a copy of the list: the macros require one that is not constant.
 bool SetList(SSL_CTX *context, int command, std::string list) {
   return SSL_CTX_ctrl(context, command, 0, list.data()) == 1;
 }
@@ -79,7 +79,7 @@ std::vector<std::string> GetCipherNames(const SSL_CTX *context) {
   return names;
 }
 
-/// Those of the machine's suites that are also ours, in the machine's order.
+/// The machine's suites that are also our suites, in the machine's order.
 std::string KeepOurCiphers(SSL_CTX *context, const Crypto::OpenSslErrorScope &errors) {
   const std::vector<std::string> ofMachine = GetCipherNames(context);
   Require(SSL_CTX_set_cipher_list(context, CIPHERS) == 1, errors, NO_CIPHERS);

@@ -12,10 +12,10 @@
 
 namespace Tarvel::System {
 
-/// The reason why no connection to `host` and `port` can be tried; empty when one can.
+/// Why no connection to `host` and `port` can be tried; empty when `host` and `port` are valid.
 std::string RefuseTarget(std::string_view host, int port);
 
-/// The address that `host` is, with or without brackets; `std::nullopt` when it is a name.
+/// The address in `host`, with or without brackets; `std::nullopt` when `host` is not an address.
 std::optional<boost::asio::ip::address> ParseAddress(std::string_view host);
 
 /// "host:port" or "[IPv6 address]:port", for messages.

@@ -61,12 +61,12 @@ int UnitsInto(const DateTime &value) {
   return static_cast<int>(floor<Unit>(shown - floor<Larger>(shown)).count());
 }
 
-/// Whether the fields of that point stay within the years 1 to 9999 with this bias.
+/// Whether the point in time, shown with this bias, is within the years 1 to 9999.
 bool CanShow(std::int64_t utcMicroseconds, std::int64_t biasMinutes) {
   return IsInRange(utcMicroseconds + microseconds(minutes(biasMinutes)).count());
 }
 
-/// The bias of the process's local zone at that point; 0 when it is unknown or cannot be written.
+/// The bias of the process's local zone at that time; 0 when it is unknown or cannot be written.
 std::int32_t LocalBiasMinutes(std::int64_t utcMicroseconds) {
   const std::time_t seconds = floor<std::chrono::seconds>(microseconds(utcMicroseconds)).count();
   std::tm local{};

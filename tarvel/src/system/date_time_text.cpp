@@ -20,7 +20,7 @@ constexpr bool IsDigit(char c) noexcept {
 
 struct Fraction {
   int microseconds;
-  bool isZero; ///< whether every digit is 0, also those finer than a microsecond
+  bool isZero; ///< whether every digit is 0, including those finer than a microsecond
 };
 
 /// Reads the text from left to right and refuses it at the first character that does not fit.
@@ -45,7 +45,7 @@ public:
     }
   }
 
-  /// A number of exactly `digits` digits.
+  /// Reads a number of exactly `digits` digits.
   int Number(int digits, int minimum, int maximum, const char *field) {
     int value = 0;
     for (int i = 0; i < digits; ++i) {
@@ -57,7 +57,7 @@ public:
     return value;
   }
 
-  /// The digits after the point: at least one.
+  /// Reads the digits after the point: at least one.
   Fraction FractionDigits() {
     int microseconds = 0;
     bool isZero = true;
@@ -71,7 +71,7 @@ public:
     return {microseconds, isZero};
   }
 
-  /// The zone after the time: "Z", an offset, or nothing. In minutes east of UTC.
+  /// Reads the zone after the time: "Z", an offset, or nothing. @return minutes east of UTC.
   int Zone() {
     if (AtEnd() || Skip('Z')) {
       return 0;

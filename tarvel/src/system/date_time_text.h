@@ -22,10 +22,10 @@ struct DateTimeFields {
 };
 
 /// Splits `text` into its fields.
-/// @throws DateTimeFormatException when it has another form, or a field is out of its range.
+/// @throws DateTimeFormatException when `text` has another form, or a field is out of its range.
 DateTimeFields ParseDateTimeText(std::string_view text);
 
-/// Throws the `DateTimeFormatException` for `text`.
+/// Throws a `DateTimeFormatException` that quotes `text`.
 [[noreturn]] void RefuseDateTimeText(std::string_view text, std::string_view reason);
 
 } // namespace Tarvel::System

@@ -38,15 +38,15 @@ Descriptors &GetDescriptors() {
 
 class IoEngine final : public ForkListener {
 public:
-  /// @throws boost::system::system_error without a descriptor.
+  /// @throws boost::system::system_error when no descriptor is left.
   IoEngine() {
-    // Asio opens the descriptors that it waits on with the first socket or timer: done here, so that no later one can
-    // fail for lack of them.
+    // Asio opens the descriptors that it waits on when the first socket and the first timer are made. They are made
+    // here, so that no later one fails for lack of descriptors.
     const boost::asio::ip::tcp::socket socket(m_context);
     const boost::asio::steady_timer timer(m_context);
   }
 
-  /// @throws InvalidStateException when not one thread can be started.
+  /// @throws InvalidStateException when no thread can be started.
   void Start() {
     StartBackgroundThread("tarvel-io", [this] { Run(); }).detach();
     try {
@@ -54,13 +54,13 @@ public:
         StartBackgroundThread("tarvel-io", [this] { Run(); }).detach();
       }
     } catch (...) {
-      // One thread, which runs already, does the same work, only more slowly.
+      // The first thread runs already. It does the same work, only more slowly.
     }
   }
 
   boost::asio::io_context &GetContext() noexcept { return m_context; }
 
-  // The threads leave the context when their handlers have returned. Then no lock of Asio is held.
+  // The threads leave the context when their handlers have returned, and then hold no lock of Asio.
   void BeforeFork() noexcept override { m_context.stop(); }
   void AtFork() noexcept override { Notify(boost::asio::execution_context::fork_prepare); }
   void AfterForkInParent() noexcept override {
@@ -96,14 +96,14 @@ private:
   boost::asio::io_context m_context{IO_THREADS};
   const boost::asio::executor_work_guard<boost::asio::io_context::executor_type> m_work{m_context.get_executor()};
   IoEngine *m_ofParent =
-      nullptr; // never used; keeps the objects of the parent's operations reachable, so they are no leak
+      nullptr; // never used; keeps the objects of the parent's operations reachable, so that no leak is reported
 };
 
 std::atomic<IoEngine *> engine{nullptr};
 IoEngine *engineOfParent = nullptr; // of the process that this one was forked from
 
 // Asio replaces the child's copies of its own descriptors by new ones, so that closing a socket afterwards does not
-// affect the parent's. The handlers in the context stay there: they belong to the parent.
+// affect the parent's sockets. The handlers stay in the context and never run here: they belong to the parent.
 void IoEngine::AfterForkInChild() noexcept {
   Notify(boost::asio::execution_context::fork_child);
   Descriptors &descriptors = GetDescriptors();

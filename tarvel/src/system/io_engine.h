@@ -13,10 +13,10 @@ namespace Tarvel::System {
 /// pending operations share them, so a handler must never block; an exception that it throws is logged and ignored. A
 /// child process made by `fork` has its own context and threads, which start with its own first call. Use the context,
 /// its sockets and its timers only within a `Computation`; its own threads are in one already.
-/// @throws InvalidStateException when the first thread cannot be started, or no descriptor is left to wait with.
+/// @throws InvalidStateException when the first thread cannot be started, or the process has no descriptor left.
 boost::asio::io_context &GetIoContext();
 
-/// Base of an object with a descriptor that is to be closed in a child of this process. The constructor of the derived
+/// Base of an object with a descriptor that must be closed in a child of this process. The constructor of the derived
 /// class calls `Enter`, its destructor `Leave`.
 class ClosesInChild : public boost::intrusive::list_base_hook<> {
 public:

@@ -65,8 +65,8 @@ void AppendAddress(AddressList &addresses, const sockaddr &socketAddress) {
   }
 }
 
-/// The system's error when it has no descriptor left, else 0. The resolver reports only an unknown name then. The lack
-/// shows in the value that it left in `errno`, or in that no descriptor can be opened now.
+/// The system's error when no descriptor is left, else 0. In that case the resolver reports only an unknown name. It
+/// may have left the error in `errno`; otherwise this tries to open a descriptor.
 int FindLackOfDescriptors(int errorOfResolver) noexcept {
   if (errorOfResolver == EMFILE || errorOfResolver == ENFILE) {
     return errorOfResolver;

@@ -15,17 +15,17 @@ namespace Tarvel::System {
 using AddressList = std::vector<boost::asio::ip::address>;
 
 /// Returns the addresses of a host in the order in which to try them; at least one.
-/// @throws NetworkException when there is none; the message is only the reason.
+/// @throws NetworkException when the host has no address; the message is only the reason.
 using NameLookup = std::function<AddressList(const std::string &host)>;
 
 /// The addresses of `host` from the system's resolver, or from the innermost `ScopedNameLookup`. Blocks the calling
-/// thread for as long as the resolver takes, which the system cannot interrupt.
+/// thread until the resolver returns; the system cannot interrupt it.
 /// @throws NetworkException when there is no address.
 AddressList LookUpName(const std::string &host);
 
 /// Replaces the resolver by `lookup` for the whole process, for as long as this exists. For tests. `lookup` is called
 /// on any thread, several at once, and may still run after the scope's end. A connection may join a look-up that began
-/// before the scope, so a test whose look-ups hang waits for their end.
+/// before the scope, so a test whose look-ups hang must wait until they end.
 class ScopedNameLookup {
 public:
   explicit ScopedNameLookup(NameLookup lookup);

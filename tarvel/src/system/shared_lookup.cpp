@@ -38,19 +38,19 @@ struct Registry {
   const Ref<ThreadPool> pool = CreateEndlessThreadPool(MAX_NAME_LOOKUPS, LOOKUP_IDLE_TIME);
   ForkSafeMutex mutex;                                    // never held while a completion runs
   std::map<std::string, std::shared_ptr<Lookup>> lookups; // guarded by mutex; by name
-  unsigned generation = GetForkGeneration();              // guarded by mutex; of the process that looks them up
+  unsigned generation = GetForkGeneration();              // guarded by mutex; of the process that started them
 };
 
 Registry &GetRegistry() {
   const Computation computing;
-  static Registry *const registry = new Registry; // never destroyed: a look-up cannot be ended
+  static Registry *const registry = new Registry; // never destroyed: a look-up cannot be interrupted
   return *registry;
 }
 
 /// Under the registry's lock.
 void Forget(Registry &registry, const Lookup &lookup) {
   const auto found = registry.lookups.find(lookup.name);
-  if (found != registry.lookups.end() && found->second.get() == &lookup) { // else it is a parent's
+  if (found != registry.lookups.end() && found->second.get() == &lookup) { // otherwise `lookup` is a parent's
     registry.lookups.erase(found);
   }
 }
@@ -62,7 +62,7 @@ public:
 
   void Cancel() noexcept override {
     const Ref<Asker> self(this); // the look-up's reference may be the last
-    LookupCompletion completion; // destroyed outside the lock: it may hold anything
+    LookupCompletion completion; // destroyed outside the lock: it may own any object
     Ref<ScheduledItem> neverToRun;
     Registry &registry = GetRegistry();
     {
@@ -86,13 +86,13 @@ public:
 
   bool IsDone() const noexcept override { return m_isDone; }
 
-  /// Notes where the look-up lists this. Under the registry's lock.
+  /// Records this caller's place in the look-up's list. Under the registry's lock.
   void SetPlace(std::shared_ptr<Lookup> lookup, AskerList::iterator place) noexcept {
     m_lookup = std::move(lookup);
     m_place = place;
   }
 
-  /// From then on `Cancel` does nothing. Under the registry's lock.
+  /// After this, `Cancel` does nothing. Under the registry's lock.
   void ForgetPlace() noexcept { m_lookup.reset(); }
 
   /// Called once, after `ForgetPlace`.
@@ -118,7 +118,8 @@ bool Begin(Lookup &lookup) {
   return !lookup.askers.empty();
 }
 
-/// Removes the look-up from the registry, so that later callers start another one. @return those that wait for it.
+/// Removes the look-up from the registry, so that later callers start another one.
+/// @return the callers that wait for it.
 AskerList End(Lookup &lookup) {
   Registry &registry = GetRegistry();
   const std::lock_guard<ForkSafeMutex> lock(registry.mutex);
@@ -145,7 +146,7 @@ void Run(Lookup &lookup, const std::string &host) {
   }
 }
 
-/// Starts a look-up for `asker`. Under the registry's lock, which the look-up needs to begin.
+/// Starts a look-up for `asker`. Under the registry's lock; the look-up cannot begin before it is released.
 std::shared_ptr<Lookup> StartLookup(Registry &registry, const std::string &host, const std::string &name,
                                     const Ref<Asker> &asker) {
   auto lookup = std::make_shared<Lookup>();
@@ -162,7 +163,7 @@ std::shared_ptr<Lookup> StartLookup(Registry &registry, const std::string &host,
 }
 
 /// In a child process: removes the look-ups of its parent, which never end here. Under the registry's lock.
-/// @return those that wait for them, to be destroyed after the lock is released; they are never called in this process.
+/// @return the callers that wait for them. They must be destroyed after the lock is released, and are never called.
 AskerList RemoveThoseOfParent(Registry &registry) {
   AskerList askers;
   if (std::exchange(registry.generation, GetForkGeneration()) == GetForkGeneration()) {

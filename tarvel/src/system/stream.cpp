@@ -25,7 +25,7 @@ public:
 
 private:
   const Ref<Stream> m_stream;
-  const TcpClientSocketImpl *const m_socket; // m_stream, if it is a socket of this class
+  const TcpClientSocketImpl *const m_socket; // m_stream; null if it is another kind of stream
   std::atomic<bool> m_cancelled{false};
 };
 

@@ -28,7 +28,7 @@ using boost::system::error_code;
 
 namespace {
 
-/// The failure that a completion gets when there is no memory for a message of its own.
+/// The failure that a completion gets when there is no memory for a message about its operation.
 const NetworkException &OutOfMemory() {
   const Computation computing;
   static const NetworkException *const failure = new NetworkException("There is not enough memory"); // never destroyed
@@ -71,7 +71,7 @@ TcpClientSocketImpl::TcpClientSocketImpl()
 TcpClientSocketImpl::~TcpClientSocketImpl() {
   const Computation computing;
   Leave();
-  error_code ignored; // the descriptor is gone in any case
+  error_code ignored; // the descriptor is released in any case
   m_socket.close(ignored);
   m_attemptTimer.cancel(ignored);
   m_connectEnd.cancel(ignored);
@@ -99,7 +99,7 @@ void TcpClientSocketImpl::AsyncConnect(const std::string &host, int port, Connec
   TryStep([this, &host] { StartConnect(host); });
 }
 
-/// Runs one step of the connect; an exception, `std::bad_alloc` included, ends the connect with that failure.
+/// Runs one step of the connect. An exception, including `std::bad_alloc`, ends the connect with that failure.
 template <typename Step>
 void TcpClientSocketImpl::TryStep(const Step &step) noexcept {
   try {
@@ -163,11 +163,11 @@ void TcpClientSocketImpl::TryNextAddress() {
   EndConnect(m_attempts);
 }
 
-// An address that drops packets must not use up the time for the others.
+// An address that never answers must not use up the time for the others.
 void TcpClientSocketImpl::LimitAttempt() {
   m_isAttemptOverdue = false;
   if (m_nextAddress == m_addresses.size()) {
-    return; // the caller of the connection limits the last one
+    return; // the caller limits the time of the last attempt
   }
   m_attemptTimer.expires_after(MAX_ATTEMPT_TIME);
   m_attemptTimer.async_wait([self = Ref(this), attempt = m_nextAddress](const error_code &cancelled) {
@@ -201,7 +201,7 @@ void TcpClientSocketImpl::OnConnectAttempt(const error_code &error) {
   {
     const std::lock_guard<ForkSafeMutex> lock(m_mutex);
     if (m_stage != Stage::CONNECTING) {
-      return; // has ended already, which `OnConnectEnd` reports to the handler
+      return; // the connect has ended already; `OnConnectEnd` reports that
     }
     error_code ignored;
     m_attemptTimer.cancel(ignored);
@@ -213,7 +213,7 @@ void TcpClientSocketImpl::OnConnectAttempt(const error_code &error) {
       return;
     }
     m_stage = Stage::CONNECTED;
-    m_socket.set_option(tcp::no_delay(true), ignored); // without it the connection is slow, not wrong
+    m_socket.set_option(tcp::no_delay(true), ignored); // if this fails, the connection is only slower
     handler.swap(m_connectHandler);
     m_connectEnd.cancel(ignored); // `OnConnectEnd` finds no handler then
   }
@@ -274,7 +274,7 @@ void TcpClientSocketImpl::Close() noexcept {
       EndConnect("cancelled");
     }
     m_stage = Stage::ENDED;
-    error_code ignored; // the descriptor is gone in any case
+    error_code ignored; // the descriptor is released in any case
     m_socket.close(ignored);
     lookup = std::move(m_lookup);
   }

@@ -22,8 +22,8 @@
 
 namespace Tarvel::System {
 
-/// How long the connect waits for one address of a name while there are further ones to try: long enough for a lost
-/// packet to be sent twice more.
+/// How long a connect waits for one address of a name when other addresses remain: long enough for a lost packet to be
+/// sent again twice.
 constexpr std::chrono::seconds MAX_ATTEMPT_TIME{5};
 
 class TcpClientSocketImpl final : public TcpClientSocket, private ClosesInChild {
@@ -72,11 +72,11 @@ private:
   mutable ForkSafeMutex m_mutex; // guards all that follows; never held while a handler runs
   boost::asio::ip::tcp::socket m_socket;
   Stage m_stage = Stage::FRESH;
-  bool m_isOfParent = false; // no handler is called then
+  bool m_isOfParent = false; // inherited by `fork`; the parent's handlers are never called
   std::string m_target;      // "host:port" or "[v6 address]:port", for messages; set once
   int m_port = 0;
 
-  // How reading and writing ended. Kept, because Asio may wait for ever when it reads or writes again.
+  // How reading and writing ended. Kept, because another read or write in Asio may wait for ever.
   boost::system::error_code m_readEnd;
   boost::system::error_code m_writeEnd;
 
@@ -87,7 +87,7 @@ private:
   Ref<ScheduledItem> m_lookup;
   AddressList m_addresses;
   std::size_t m_nextAddress = 0;
-  std::string m_attempts; // why the failed ones failed
+  std::string m_attempts; // the reasons of those that failed
   boost::asio::steady_timer m_attemptTimer;
   bool m_isAttemptOverdue = false;
 };

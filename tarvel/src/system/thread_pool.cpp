@@ -29,8 +29,8 @@ constexpr std::chrono::milliseconds MAX_IDLE_TIME = std::chrono::hours(24 * 365)
 class WorkItem;
 using WorkQueue = std::list<Ref<WorkItem>>;
 
-/// Keeps the thread objects of a parent process for ever: in this process they can be neither joined nor detached, and
-/// so not be destroyed.
+/// Keeps the thread objects of a parent process for ever: in this process they can be neither joined nor detached, so
+/// they cannot be destroyed.
 void KeepThreadsOfParent(std::list<std::thread> &threads) {
   struct Kept {
     ForkSafeMutex mutex;
@@ -67,12 +67,12 @@ struct PoolState {
   std::condition_variable_any changed;
   WorkQueue queue;
   std::list<std::thread> threads;
-  std::list<std::thread> retired; // ended or about to end; joined by the next to retire, or when the pool is destroyed
+  std::list<std::thread> retired; // ended or about to end; joined by the next thread that retires, or by the destructor
   std::size_t idle = 0;
   bool ended = false;
 };
 
-/// The pool whose thread this is; null on every other thread.
+/// The pool that the calling thread belongs to; null on a thread that belongs to no pool.
 thread_local const PoolState *currentPool = nullptr;
 
 class WorkItem final : public ScheduledItem {
@@ -82,7 +82,7 @@ public:
 
   void Cancel() noexcept override {
     const Ref<WorkItem> self(this); // the queue's reference may be the last
-    std::function<void()> work;     // destroyed outside the lock: it may hold anything
+    std::function<void()> work;     // destroyed outside the lock: it may own any object
     {
       const std::lock_guard<ForkSafeMutex> lock(m_pool->mutex);
       if (m_stage != Stage::QUEUED) {
@@ -137,7 +137,8 @@ Ref<WorkItem> WaitForWork(PoolState &pool, std::unique_lock<ForkSafeMutex> &lock
   return item;
 }
 
-/// Removes the calling thread from the pool's list, and joins those that retired before it.
+/// Removes the calling thread from the pool's list, and joins those that retired before it. A thread of an endless pool
+/// is detached instead.
 void Retire(PoolState &pool, std::list<std::thread>::iterator self, std::unique_lock<ForkSafeMutex> &lock) {
   std::list<std::thread> earlier;
   if (pool.isEndless) {

@@ -9,7 +9,7 @@
 namespace Tarvel::System {
 
 /// A pool that lives until the process ends. Its threads are never joined; each is detached when it retires. The caller
-/// never releases the reference.
+/// must never release the reference.
 Ref<ThreadPool> CreateEndlessThreadPool(std::size_t threadCeiling, std::chrono::milliseconds idleTime);
 
 } // namespace Tarvel::System

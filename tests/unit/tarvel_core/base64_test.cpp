@@ -178,7 +178,7 @@ TEST(Base64Decode, RefusesEveryPrefixThatEndsInsideAGroup) {
   }
 }
 
-TEST(Base64Decode, ReadsMebibytes) {
+TEST(Base64Decode, ReadsTextOfSeveralMebibytes) {
   const std::string bytes(3 << 20, 'x');
   EXPECT_EQ(Decoded(Encoded(bytes)), bytes);
 }

@@ -71,7 +71,7 @@ TYPED_TEST(ExceptionClass, CopyOfABaseReferenceOwnsAnObjectOfTheDynamicClass) {
   EXPECT_EQ(kept.what(), message);
 }
 
-TYPED_TEST(ExceptionClass, ThrowOfABaseReferenceRaisesTheDynamicClass) {
+TYPED_TEST(ExceptionClass, ThrowOfABaseReferenceThrowsTheDynamicClass) {
   const TypeParam original("detail");
   const Exception &held = original;
   try {
@@ -111,14 +111,14 @@ TEST(InvalidArgumentException, PutsItsPrefixBeforeTheDetailOnce) {
   EXPECT_STREQ(clone->what(), "Invalid argument : lifetime");
 }
 
-TEST(Exception, BacktraceHasOneFrameALine) {
+TEST(Exception, BacktraceHasOneFramePerLine) {
   const std::string backtrace = Exception("x").GetBacktrace();
   ASSERT_FALSE(backtrace.empty());
   EXPECT_EQ(backtrace.back(), '\n');
   EXPECT_EQ(backtrace.find("\n\n"), std::string::npos);
 }
 
-TEST(Exception, DumpNamesClassMessageAndCallStack) {
+TEST(Exception, DumpContainsClassMessageAndCallStack) {
   const IOException error("no such thing");
   EXPECT_EQ(error.Dump(), "Tarvel::IOException: no such thing\n" + error.GetBacktrace());
 }
@@ -170,7 +170,7 @@ TEST(CheckedCast, KeepsNull) {
   EXPECT_FALSE(CheckedCast<Apple>(Ref<Object>()));
 }
 
-TEST(CheckedCast, NamesExpectedAndActualClass) {
+TEST(CheckedCast, ReportsExpectedAndActualClass) {
   const Ref<Object> object = MakeRef<Pear>();
   EXPECT_THROW(CheckedCast<Apple>(object), TypeMismatchException);
   EXPECT_EQ(MessageOf([&] { CheckedCast<Apple>(object); }),

@@ -34,7 +34,7 @@ std::string IOErrorOf(const T &action) {
   return "nothing was raised";
 }
 
-/// A reader that returns one byte at a time, `length` of them; for the largest number, without end.
+/// A reader that returns `length` bytes, one at a time. `NO_LIMIT` makes it practically endless.
 class DripReader final : public Reader {
 public:
   explicit DripReader(std::size_t length) : m_left(length) {}
@@ -51,7 +51,7 @@ private:
   std::size_t m_left;
 };
 
-/// A temporary file, removed at the end.
+/// A temporary file. The destructor removes it.
 class TemporaryFile {
 public:
   explicit TemporaryFile(std::string_view content) {
@@ -111,7 +111,7 @@ TEST(StringWriter, KeepsWhatIsWrittenInOrder) {
   EXPECT_EQ(writer->GetText(), std::string("ab\0c", 4));
 }
 
-TEST(StringWriter, StartsAgainWithAnEmptyTextAfterTakeText) {
+TEST(StringWriter, IsEmptyAndReusableAfterTakeText) {
   const Ref<StringWriter> writer = CreateStringWriter();
   writer->Write("first");
   EXPECT_EQ(writer->TakeText(), "first");
@@ -149,7 +149,7 @@ TEST(OpenFile, RefusesAPathWithAZeroByte) {
   EXPECT_EQ(IOErrorOf([&] { OpenFile(path); }), "Cannot open " + file.Path() + ": Invalid argument");
 }
 
-TEST(OpenFile, FailsOnReadingADirectory) {
+TEST(OpenFile, FailsToReadADirectory) {
   const Ref<Reader> reader = OpenFile("/");
   EXPECT_EQ(IOErrorOf([&] { ReadSome(*reader, 1); }), "Cannot read /: Is a directory");
 }

@@ -52,7 +52,7 @@ TEST(StringUtilToLower, MapsEverySigmaToTheCommonForm) {
   EXPECT_EQ(StringUtil::ToLower("ΣΑΣ"), "σασ");
 }
 
-TEST(StringUtilToUpper, LeavesCharactersThatAreNotLetters) {
+TEST(StringUtilToUpper, KeepsCharactersThatAreNotLetters) {
   const std::string text = "0123 \t~{}€漢字😀\x7F";
   EXPECT_EQ(StringUtil::ToUpper(text), text);
   EXPECT_EQ(StringUtil::ToLower(text), text);
@@ -104,7 +104,7 @@ TEST(StringUtilToUpper, DoesNotDependOnTheProcessLocale) {
   std::setlocale(LC_ALL, before.c_str());
 }
 
-TEST(StringUtilToUpper, LeavesTheProcessLocaleAlone) {
+TEST(StringUtilToUpper, DoesNotChangeTheProcessLocale) {
   const std::string before = std::setlocale(LC_ALL, nullptr);
   StringUtil::ToUpper("é");
   EXPECT_EQ(std::string(std::setlocale(LC_ALL, nullptr)), before);

@@ -43,18 +43,18 @@ TEST(MessageFormatter, ReadsOneDigitOnly) {
   EXPECT_EQ(MessageFormatter::ASPrint("%10", "a"), "a0");
 }
 
-TEST(MessageFormatter, LeavesPlaceholdersWithoutArgument) {
+TEST(MessageFormatter, KeepsPlaceholdersWithoutArgument) {
   EXPECT_EQ(MessageFormatter::ASPrint("%1 %2 %9", "a"), "a %2 %9");
   EXPECT_EQ(MessageFormatter::ASPrint("%1"), "%1");
 }
 
-TEST(MessageFormatter, LeavesTextThatIsNotAPlaceholder) {
+TEST(MessageFormatter, KeepsTextThatIsNotAPlaceholder) {
   for (const char *format : {"", "%", "100 %", "%0", "%x", "% 1", "a%", "%s%n"}) {
     EXPECT_EQ(MessageFormatter::ASPrint(format, "a"), format);
   }
 }
 
-TEST(MessageFormatter, TurnsTwoPerCentSignsIntoOne) {
+TEST(MessageFormatter, WritesTwoPercentSignsAsOne) {
   EXPECT_EQ(MessageFormatter::ASPrint("100%%", "a"), "100%");
   EXPECT_EQ(MessageFormatter::ASPrint("%%1", "a"), "%1");
   EXPECT_EQ(MessageFormatter::ASPrint("%%%1", "a"), "%a");

@@ -21,7 +21,7 @@ TEST(SecretText, IsEmptyAtFirst) {
   EXPECT_EQ(SecretText().Get(), "");
 }
 
-TEST(SecretText, TakesOverATextAndEmptiesIt) {
+TEST(SecretText, MovesTheTextAndEmptiesItsSource) {
   for (const std::string text : {"short", "a text that is too long to be kept inside of a string object"}) {
     std::string source = text;
 

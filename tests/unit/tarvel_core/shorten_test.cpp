@@ -22,7 +22,7 @@ TEST(Shorten, CountsTheBytesThatAreLeftOut) {
 }
 
 TEST(Shorten, CutsBetweenTwoCharacters) {
-  const std::string text = "a\xC3\xA4\xE2\x82\xAC\xF0\x9F\x98\x80z"; // of one, two, three, four bytes and one
+  const std::string text = "a\xC3\xA4\xE2\x82\xAC\xF0\x9F\x98\x80z"; // characters of 1, 2, 3, 4 and 1 bytes
   const char *const expected[] = {"... (11 more bytes)",
                                   "a... (10 more bytes)",
                                   "a... (10 more bytes)",

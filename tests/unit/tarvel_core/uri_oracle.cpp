@@ -28,7 +28,7 @@ bool IsUriOfLibxml2(const std::string &text) {
   return UriHandle(xmlParseURI(text.c_str())) != nullptr;
 }
 
-/// `text`, which we accept, with a port that libxml2 accepts too.
+/// Returns `text`, which our parser accepts, with a port that libxml2 accepts, too.
 std::string CorrectPort(std::string text, UriComparison &comparison) {
   const std::optional<std::string_view> port = SplitUriReference(text)->port;
   if (!port) {
@@ -42,7 +42,7 @@ std::string CorrectPort(std::string text, UriComparison &comparison) {
   return text.replace(static_cast<std::size_t>(port->data() - text.data()), port->size(), "1");
 }
 
-/// `text`, which libxml2 accepts, without the parts that the standard does not allow.
+/// Returns `text`, which libxml2 accepts, with replacements for what the standard does not allow.
 std::string CorrectBrackets(std::string text, UriComparison &comparison) {
   const std::size_t slashes = text.find("//");
   const std::size_t open = text.find('[');
@@ -64,7 +64,7 @@ std::string_view ToView(const char *text) {
   return text ? text : "";
 }
 
-/// libxml2 distinguishes an empty part from a missing one in query and fragment only.
+/// libxml2 distinguishes an empty part from a missing one only if it is the query or the fragment.
 bool HasEqualParts(const std::string &text) {
   const UriHandle theirs(xmlParseURIRaw(text.c_str(), RAW));
   const std::optional<UriReference> ours = SplitUriReference(text);

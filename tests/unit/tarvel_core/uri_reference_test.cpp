@@ -84,7 +84,7 @@ TEST(IsUriReference, AcceptsNamespaceNames) {
   }
 }
 
-TEST(IsUriReference, RefusesACharacterThatNoPartMayHave) {
+TEST(IsUriReference, RefusesCharactersThatNoPartMayContain) {
   using namespace std::string_view_literals;
   for (const char *const before : {"", "x:", "x://", "x://h/", "x:?", "x:#"}) {
     for (int code = 0; code < 256; ++code) {
@@ -145,7 +145,7 @@ TEST(IsUriReference, RefusesASecondNumberSign) {
   EXPECT_FALSE(IsUriReference("a#b?c#"));
 }
 
-/// Section 3.2.2 of the standard, production by production.
+/// The grammar of RFC 3986, section 3.2.2, rule by rule.
 std::regex MakeAddressPattern() {
   const std::string group = "[0-9A-Fa-f]{1,4}";
   const std::string octet = "([0-9]|[1-9][0-9]|1[0-9]{2}|2[0-4][0-9]|25[0-5])";

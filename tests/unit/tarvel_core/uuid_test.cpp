@@ -10,7 +10,7 @@
 namespace Tarvel {
 namespace {
 
-TEST(StringUtilGenerateUuid, WritesARandomUuidOfVersion4) {
+TEST(StringUtilGenerateUuid, ReturnsARandomUuidOfVersion4) {
   for (int i = 0; i < 100; ++i) {
     EXPECT_THAT(StringUtil::GenerateUuid(),
                 testing::MatchesRegex("[0-9a-f]{8}-[0-9a-f]{4}-4[0-9a-f]{3}-[89ab][0-9a-f]{3}-[0-9a-f]{12}"));

@@ -132,7 +132,7 @@ TEST_F(LoggerTest, ReplacesAndRemovesTheSink) {
   EXPECT_EQ(second, 1);
 }
 
-TEST_F(LoggerTest, AllowsASinkToLogAndToReplaceItself) {
+TEST_F(LoggerTest, AllowsASinkToLogAndToRemoveItself) {
   const Ref<Logger> logger = Logger::CreateLogger(m_root, "L", LEVEL_OPERATION);
   int calls = 0;
   m_root->SetSink([&](const LogRecord &) {
@@ -144,7 +144,7 @@ TEST_F(LoggerTest, AllowsASinkToLogAndToReplaceItself) {
   EXPECT_EQ(calls, 1);
 }
 
-TEST_F(LoggerTest, ReleasesTheSinkThatIsReplaced) {
+TEST_F(LoggerTest, ReleasesTheSinkThatIsRemoved) {
   const auto held = std::make_shared<int>(0);
   m_root->SetSink([held](const LogRecord &) {});
   EXPECT_EQ(held.use_count(), 2);

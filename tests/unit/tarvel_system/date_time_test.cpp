@@ -136,7 +136,7 @@ TEST(DateTime, FollowsTheLeapYearRuleOfTheGregorianCalendar) {
   }
 }
 
-TEST(DateTime, TwentyFourHoursIsTheNextDaysStart) {
+TEST(DateTime, ReadsHour24AsTheStartOfTheNextDay) {
   EXPECT_EQ(DateTime("2024-02-29T24:00:00Z").ToString(), "2024-03-01T00:00:00.000Z");
   EXPECT_EQ(DateTime("2023-12-31T24:00:00.0+01:00").ToString(), "2024-01-01T00:00:00.000+01:00");
 }

@@ -49,7 +49,7 @@ TEST(ScopedEnvironment, Nests) {
   EXPECT_EQ(GetUtcDateTime().GetUtcTime(), 1);
 }
 
-TEST(ScopedEnvironment, UsesTheRealSourceForAnEmptyFunctionAlsoInsideAnotherScope) {
+TEST(ScopedEnvironment, UsesTheRealSourceForAnEmptyFunctionEvenInsideAnotherScope) {
   const ScopedEnvironment outer({[] { return YEAR_3000; }, [] { return std::string("outer"); }});
   const ScopedEnvironment inner{Environment{}};
   EXPECT_LT(GetUtcDateTime().GetUtcTime(), YEAR_3000);

@@ -27,8 +27,8 @@ using Testing::Eventually;
 using Testing::PATIENCE;
 using Testing::UnusedPort;
 
-/// Replaces the resolver. A name that is held gets no answer until it is released; every name has the address
-/// 127.0.0.1, or fails with the failure that is set.
+/// Replaces the resolver. `Hold` makes the look-ups of a name wait until it is released. Each look-up returns the
+/// address 127.0.0.1, or fails with the message that `FailWith` has set.
 class ResolverStandIn {
 public:
   ResolverStandIn()
@@ -36,7 +36,7 @@ public:
         m_scope([state = m_state](const std::string &host) { return state->LookUp(host); }) {}
   ResolverStandIn(const ResolverStandIn &) = delete;
   ResolverStandIn &operator=(const ResolverStandIn &) = delete;
-  /// The next test must not join a look-up of this one.
+  /// Ends all look-ups: the next test must not join one of this test.
   ~ResolverStandIn() {
     ReleaseAll();
     EXPECT_TRUE(Eventually([this] { return CountRunning() == 0; }));
@@ -64,7 +64,7 @@ public:
     m_state->failure = message;
   }
 
-  /// The names for which a look-up has begun, in order.
+  /// The names whose look-ups have begun, in order.
   std::vector<std::string> GetBegun() const {
     const std::lock_guard<std::mutex> lock(m_state->mutex);
     return m_state->begun;
@@ -126,7 +126,7 @@ public:
 
   int CountCalls() const { return m_completion.GetCalls(); }
 
-  /// How it ended: "looked up", or the reason.
+  /// How the connect ended: "looked up" after a look-up without failure, else the reason.
   std::string GetOutcome() const {
     const std::string message = m_completion.GetMessage();
     const std::string start = "Cannot connect to " + m_endpoint + ": ";
@@ -145,7 +145,7 @@ private:
 
 using Names = std::vector<std::string>;
 
-/// Holds names that no other test uses, and asks for each.
+/// Holds names that no other test uses, and starts a connect to each.
 std::vector<Asking> AskForDeadNames(ResolverStandIn &resolver, std::size_t count) {
   std::vector<Asking> dead;
   for (std::size_t i = 0; i < count; ++i) {
@@ -202,7 +202,7 @@ TEST(SharedLookup, FailsForAllCallersWithTheSameName) {
   EXPECT_EQ(resolver.GetBegun(), Names{"sts.example"});
 }
 
-TEST(SharedLookup, KeepsNoFailureForLaterRequests) {
+TEST(SharedLookup, DoesNotKeepAFailureForLaterRequests) {
   ResolverStandIn resolver;
   resolver.FailWith("Temporary failure in name resolution");
   EXPECT_EQ(Asking("sts.example").GetOutcome(), "Temporary failure in name resolution");
@@ -211,7 +211,7 @@ TEST(SharedLookup, KeepsNoFailureForLaterRequests) {
   EXPECT_EQ(resolver.GetBegun(), (Names{"sts.example", "sts.example"}));
 }
 
-TEST(SharedLookup, KeepsNoAddressForLaterRequests) {
+TEST(SharedLookup, DoesNotKeepAnAddressForLaterRequests) {
   ResolverStandIn resolver;
   EXPECT_EQ(Asking("sts.example").GetOutcome(), "looked up");
   resolver.FailWith("Name or service not known");
@@ -219,7 +219,7 @@ TEST(SharedLookup, KeepsNoAddressForLaterRequests) {
   EXPECT_EQ(resolver.GetBegun(), (Names{"sts.example", "sts.example"}));
 }
 
-TEST(SharedLookup, GoesOnWhenOneCallerStopsWaiting) {
+TEST(SharedLookup, ContinuesWhenOneCallerStopsWaiting) {
   ResolverStandIn resolver;
   resolver.Hold("sts.example");
   Asking leaving("sts.example");

@@ -335,7 +335,7 @@ TEST(TcpClientSocket, WorksAfterAHandlerHasThrown) {
   EXPECT_EQ(Connect("127.0.0.1", server.GetPort()), "");
 }
 
-TEST(TcpClientSocket, ADescriptorIsNotInherited) {
+TEST(TcpClientSocket, ClosesItsDescriptorOnExec) {
   ScriptedServer server([](ServerConnection &connection) { connection.Stall(); });
   const Ref<TcpClientSocket> socket = CreateTcpClientSocket();
   ASSERT_EQ(Connect(socket, "127.0.0.1", server.GetPort()), "");

@@ -30,7 +30,7 @@ using Testing::Completion;
 using Testing::Eventually;
 using Testing::PATIENCE;
 
-/// Blocks the threads that call `Wait` until `Open` is called.
+/// `Wait` returns a work item that blocks until `Open` is called.
 class Gate {
 public:
   auto Wait() {
@@ -49,7 +49,7 @@ TEST(ThreadPool, HasNoThreadBeforeTheFirstItem) {
   EXPECT_EQ(pool->GetThreadCount(), 0u);
 }
 
-TEST(ThreadPool, HasAtLeastOneThreadAtTheCeiling) {
+TEST(ThreadPool, HasACeilingOfAtLeastOneThread) {
   EXPECT_EQ(CreateThreadPool(0)->GetThreadCeiling(), 1u);
 }
 
@@ -82,7 +82,7 @@ TEST(ThreadPool, AnIdleThreadTakesTheNextItem) {
     const Ref<ScheduledItem> item = pool->QueueWorkItem([] {});
     ASSERT_TRUE(Eventually([&] { return item->IsDone(); }));
   }
-  // An item is done a moment before its thread is idle again, so there may be a second thread.
+  // An item is done a moment before its thread is idle again, so the pool may have started another thread.
   EXPECT_LE(pool->GetThreadCount(), 3u);
 }
 
@@ -238,7 +238,7 @@ TEST(GetThreadPool, ReturnsTheSamePoolEachTime) {
   EXPECT_EQ(ran.get_future().wait_for(PATIENCE), std::future_status::ready);
 }
 
-/// One exchange over a new connection, which blocks the calling thread. @return what was read back, or the failure.
+/// Makes one exchange over a new connection, and blocks until it ends. @return what was read back, or the failure.
 std::string Exchange(int port) {
   const Ref<TcpClientSocket> socket = CreateTcpClientSocket();
   Completion connected;
@@ -261,7 +261,7 @@ std::string Exchange(int port) {
 
 class ThreadPoolCeiling : public testing::TestWithParam<std::size_t> {};
 
-TEST_P(ThreadPoolCeiling, FiveHundredItemsThatWaitForTheNetworkEnd) {
+TEST_P(ThreadPoolCeiling, FinishesFiveHundredItemsThatWaitForTheNetwork) {
   constexpr int ITEMS = 500;
   Testing::ScriptedServer server([](Testing::ServerConnection &connection) {
     connection.ReadExactly(4);
