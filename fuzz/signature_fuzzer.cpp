@@ -87,8 +87,8 @@ const Node *FindTarget(const Document &document, std::string_view uri) {
 /// canonical form the signature itself uses: documents that differ in this form differ in every other.
 std::set<std::string> CoveredForms(const Document &document, const ElementNode &signature,
                                    const std::set<std::string> &uris) {
-  Tarvel::Xml::Security::CanonicalMethod method;
-  Require(Tarvel::Xml::Security::FindCanonicalMethod(Tarvel::Xml::Security::CanonicalizationUri::EXCLUSIVE, method));
+  Tarvel::Xml::Security::CanonicalizationMethod method;
+  Require(Tarvel::Xml::Security::FindCanonicalizationMethod(Tarvel::Xml::Security::CanonicalizationUri::EXCLUSIVE, method));
   std::set<std::string> forms;
   for (const std::string &uri : uris) {
     const Node *const target = FindTarget(document, uri);

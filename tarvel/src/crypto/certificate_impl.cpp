@@ -164,7 +164,7 @@ CertificateImpl::CertificateImpl(const std::uint8_t *data, std::size_t length)
     errors.RequireMemory();
   }
   m_keyBits = m_nativeKey ? static_cast<unsigned>(EVP_PKEY_get_bits(m_nativeKey)) : 0;
-  m_hasSoundExponent = m_keyKind != KeyKind::RSA || IsExponentSound(m_nativeKey);
+  m_hasAcceptableExponent = m_keyKind != KeyKind::RSA || IsExponentSound(m_nativeKey);
 }
 
 std::string CertificateImpl::GetSubject() const {

@@ -28,7 +28,7 @@ public:
 
   KeyKind GetKeyKind() const noexcept { return m_keyKind; }
   unsigned GetKeyBits() const noexcept { return m_keyBits; }
-  bool HasSoundExponent() const noexcept { return m_hasSoundExponent; }
+  bool HasAcceptableExponent() const noexcept { return m_hasAcceptableExponent; }
   KeyContexts &GetVerifyContexts() const noexcept { return m_verifyContexts; }
 
   /// Owned by the certificate. The key is null when OpenSSL does not know its algorithm.
@@ -43,7 +43,7 @@ private:
   EVP_PKEY *m_nativeKey = nullptr; // owned by m_native
   KeyKind m_keyKind = KeyKind::OTHER;
   unsigned m_keyBits = 0;
-  bool m_hasSoundExponent = false;
+  bool m_hasAcceptableExponent = false;
   std::int64_t m_notBefore = 0; // microseconds since the epoch
   std::int64_t m_notAfter = 0;
   mutable KeyContexts m_verifyContexts;

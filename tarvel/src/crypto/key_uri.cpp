@@ -22,14 +22,14 @@ constexpr std::string_view SCHEME_CHARACTERS = "ABCDEFGHIJKLMNOPQRSTUVWXYZabcdef
 
 // The state of the callback for a passphrase. An exception of the callback is stored here, because it must not pass
 // through OpenSSL's stack frames.
-struct PassphraseQuestion {
+struct PassphraseRequest {
   Passphrase passphrase;
   bool asked = false;
   std::exception_ptr failure;
 };
 
-int AnswerPassphrase(char *buffer, int size, int, void *data) noexcept {
-  auto &question = *static_cast<PassphraseQuestion *>(data);
+int SupplyPassphrase(char *buffer, int size, int, void *data) noexcept {
+  auto &question = *static_cast<PassphraseRequest *>(data);
   question.asked = true;
   try {
     const std::string &text = question.passphrase.Get();
@@ -44,7 +44,7 @@ int AnswerPassphrase(char *buffer, int size, int, void *data) noexcept {
   }
 }
 
-[[noreturn]] void ThrowStoreFailure(const OpenSslErrorScope &errors, const PassphraseQuestion &question) {
+[[noreturn]] void ThrowStoreFailure(const OpenSslErrorScope &errors, const PassphraseRequest &question) {
   constexpr const char *NOT_READABLE = "The key store cannot be read";
   if (question.failure) {
     std::rethrow_exception(question.failure);
@@ -60,7 +60,7 @@ int AnswerPassphrase(char *buffer, int size, int, void *data) noexcept {
 }
 
 // Null at the end of the store.
-KeyHandle LoadNextKey(OSSL_STORE_CTX *store, const OpenSslErrorScope &errors, const PassphraseQuestion &question) {
+KeyHandle LoadNextKey(OSSL_STORE_CTX *store, const OpenSslErrorScope &errors, const PassphraseRequest &question) {
   while (!OSSL_STORE_eof(store)) {
     const StoreInfoHandle info(OSSL_STORE_load(store));
     if (!info && (errors.PeekNewest() != 0 || errors.RanOutOfMemory() || question.failure)) {
@@ -93,9 +93,9 @@ Ref<const PrivateKey> LoadPrivateKeyFromUri(const std::string &uri, const Passph
   OpenSslGuard guard;
   guard.Require();
   const OpenSslErrorScope errors;
-  PassphraseQuestion question{Passphrase(passphrase, guard), false, nullptr};
+  PassphraseRequest question{Passphrase(passphrase, guard), false, nullptr};
   // Without this user-interface method, a loader would ask for the passphrase on the host's terminal.
-  const UiMethodHandle ui(UI_UTIL_wrap_read_pem_callback(AnswerPassphrase, 0));
+  const UiMethodHandle ui(UI_UTIL_wrap_read_pem_callback(SupplyPassphrase, 0));
   if (!ui) {
     throw OutOfMemoryException();
   }

@@ -76,10 +76,10 @@ void InitialiseOpenSsl() {
   }
 }
 
-LibraryContextScope::LibraryContextScope() noexcept : m_ofHost(OSSL_LIB_CTX_set0_default(GetLibraryContext())) {}
+LibraryContextScope::LibraryContextScope() noexcept : m_hostContext(OSSL_LIB_CTX_set0_default(GetLibraryContext())) {}
 
 LibraryContextScope::~LibraryContextScope() {
-  OSSL_LIB_CTX_set0_default(m_ofHost);
+  OSSL_LIB_CTX_set0_default(m_hostContext);
 }
 
 void UseSystemConfiguration() {

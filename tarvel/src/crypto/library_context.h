@@ -28,7 +28,7 @@ public:
   ~LibraryContextScope();
 
 private:
-  OSSL_LIB_CTX *m_ofHost = nullptr;
+  OSSL_LIB_CTX *m_hostContext = nullptr;
 };
 
 } // namespace Tarvel::Crypto

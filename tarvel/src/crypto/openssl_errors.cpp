@@ -30,10 +30,10 @@ std::string DescribeError(unsigned long code, const char *data, int flags) {
 
 // OpenSSL does not always queue the error of a failed allocation: the queue itself may lack memory, or OpenSSL removes the
 // error before it tries something else. But `malloc` has set errno, and OpenSSL's computations do not reset it.
-OpenSslErrorScope::OpenSslErrorScope() noexcept : m_errnoOfHost(errno) {
+OpenSslErrorScope::OpenSslErrorScope() noexcept : m_hostErrno(errno) {
   errno = 0;
-  if (ERR_peek_last_error_all(&m_newestOfHost, nullptr, nullptr, nullptr, nullptr) == 0) {
-    m_newestOfHost = nullptr;
+  if (ERR_peek_last_error_all(&m_newestHostError, nullptr, nullptr, nullptr, nullptr) == 0) {
+    m_newestHostError = nullptr;
   }
   ERR_set_mark();
 }
@@ -42,7 +42,7 @@ OpenSslErrorScope::OpenSslErrorScope() noexcept : m_errnoOfHost(errno) {
 OpenSslErrorScope::~OpenSslErrorScope() {
   const bool ranOut = errno == ENOMEM; // stays visible to an enclosing scope
   ERR_pop_to_mark();
-  errno = ranOut ? ENOMEM : m_errnoOfHost;
+  errno = ranOut ? ENOMEM : m_hostErrno;
 }
 
 void OpenSslErrorScope::Note(unsigned long code, const char *data, int flags) const {
@@ -55,7 +55,7 @@ void OpenSslErrorScope::Collect() const {
   m_ranOutOfMemory = m_ranOutOfMemory || errno == ENOMEM;
   const char *data = nullptr;
   int flags = 0;
-  if (!m_newestOfHost) {
+  if (!m_newestHostError) {
     while (const unsigned long code = ERR_get_error_all(nullptr, nullptr, nullptr, &data, &flags)) {
       Note(code, data, flags);
     }
@@ -81,7 +81,7 @@ void OpenSslErrorScope::RequireMemory() const {
 unsigned long OpenSslErrorScope::PeekNewest() const noexcept {
   const char *entry = nullptr;
   const unsigned long newest = ERR_peek_last_error_all(&entry, nullptr, nullptr, nullptr, nullptr);
-  return newest == 0 || entry == m_newestOfHost ? m_newest : newest;
+  return newest == 0 || entry == m_newestHostError ? m_newest : newest;
 }
 
 std::string OpenSslErrorScope::TakeText() const {

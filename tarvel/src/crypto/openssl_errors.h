@@ -45,8 +45,8 @@ private:
   void Collect() const;
   void Note(unsigned long code, const char *data, int flags) const;
 
-  const int m_errnoOfHost;
-  const char *m_newestOfHost = nullptr; // identifies an entry by its own copy of a file name; null if there is none
+  const int m_hostErrno;
+  const char *m_newestHostError = nullptr; // identifies an entry by its own copy of a file name; null if there is none
   // What has been collected so far.
   mutable bool m_ranOutOfMemory = false;
   mutable unsigned long m_newest = 0;

@@ -4,7 +4,7 @@
 
 #include "core/thread_shard.h"
 #include "crypto/library_context.h"
-#include "crypto/openssl_end.h"
+#include "crypto/openssl_clean_up.h"
 #include "crypto/openssl_errors.h"
 
 #include <tarvel/core/exception.h>
@@ -56,16 +56,16 @@ std::atomic<std::uint32_t> *TryBegin() noexcept {
   return &uses;
 }
 
-bool IsAnyGoingOn() noexcept {
+bool IsAnyUseUnderWay() noexcept {
   return std::any_of(shards.begin(), shards.end(), [](const Shard &shard) { return shard.uses.load() != 0; });
 }
 
 void OnCleanUp() noexcept {
   ended.store(true);
-  for (auto waited = WAIT_STEP; IsAnyGoingOn() && waited < MAX_WAIT; waited += WAIT_STEP) {
+  for (auto waited = WAIT_STEP; IsAnyUseUnderWay() && waited < MAX_WAIT; waited += WAIT_STEP) {
     std::this_thread::sleep_for(WAIT_STEP);
   }
-  OpenSslEndNotice::CallAll();
+  OpenSslCleanUpNotice::CallAll();
 }
 
 } // namespace

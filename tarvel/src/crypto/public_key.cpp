@@ -139,8 +139,8 @@ KeyKind GetKeyKind(const Certificate &certificate, unsigned &bits) {
   return impl.GetKeyKind();
 }
 
-bool HasSoundExponent(const Certificate &certificate) {
-  return AsImpl(certificate).HasSoundExponent();
+bool HasAcceptableExponent(const Certificate &certificate) {
+  return AsImpl(certificate).HasAcceptableExponent();
 }
 
 bool VerifyDigest(const Certificate &certificate, SignatureScheme scheme, DigestAlgorithm algorithm,

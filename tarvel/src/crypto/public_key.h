@@ -24,7 +24,7 @@ enum class KeyKind { RSA, EC_P256, EC_P384, EC_P521, OTHER };
 KeyKind GetKeyKind(const Certificate &certificate, unsigned &bits);
 
 /// Whether an RSA key's public exponent is odd and at least 3; true for other kinds of keys.
-bool HasSoundExponent(const Certificate &certificate);
+bool HasAcceptableExponent(const Certificate &certificate);
 
 /// Whether `signature` is the signature by the certificate's key over a message with that digest. An ECDSA value is r
 /// and s one after the other, as in XML Signature (RFC 4050, section 3.3). RSA-PSS uses MGF1 with the same digest, and

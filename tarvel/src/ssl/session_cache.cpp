@@ -36,7 +36,7 @@ bool IsUsable(const SSL_SESSION *session) {
 
 void SessionCache::Put(const std::string &key, SessionHandle session) {
   const std::lock_guard<ForkSafeMutex> lock(m_mutex);
-  ForgetThoseOfParent();
+  ForgetSessionsOfParent();
   Entries entry;
   entry.push_back(Entry{key, std::move(session)});
   m_byKey.emplace(key, entry.begin());
@@ -54,7 +54,7 @@ void SessionCache::Put(const std::string &key, SessionHandle session) {
 
 SessionHandle SessionCache::Take(const std::string &key) {
   const std::lock_guard<ForkSafeMutex> lock(m_mutex);
-  ForgetThoseOfParent();
+  ForgetSessionsOfParent();
   for (auto end = m_byKey.upper_bound(key); end != m_byKey.lower_bound(key); end = m_byKey.upper_bound(key)) {
     const auto newest = std::prev(end);
     SessionHandle session = std::move(newest->second->session);
@@ -76,11 +76,11 @@ void SessionCache::Abandon() noexcept {
 
 std::size_t SessionCache::GetSize() {
   const std::lock_guard<ForkSafeMutex> lock(m_mutex);
-  ForgetThoseOfParent();
+  ForgetSessionsOfParent();
   return m_entries.size();
 }
 
-void SessionCache::ForgetThoseOfParent() {
+void SessionCache::ForgetSessionsOfParent() {
   if (std::exchange(m_generation, GetForkGeneration()) != GetForkGeneration()) {
     m_byKey.clear();
     m_entries.clear();

@@ -45,7 +45,7 @@ private:
 
   /// Must be called under the lock. A child process begins with an empty cache, because only the parent uses the
   /// parent's sessions.
-  void ForgetThoseOfParent();
+  void ForgetSessionsOfParent();
 
   mutable ForkSafeMutex m_mutex;                         // guards all members below
   unsigned m_generation = GetForkGeneration();           // of the process that the entries belong to

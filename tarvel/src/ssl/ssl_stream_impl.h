@@ -5,7 +5,7 @@
 #pragma once
 
 #include "core/fork_gate.h"
-#include "crypto/openssl_end.h"
+#include "crypto/openssl_clean_up.h"
 #include "ssl/completions.h"
 #include "ssl/ssl_context_impl.h"
 #include "ssl/tls_connection.h"
@@ -124,7 +124,7 @@ private:
   std::vector<char> m_lowerInput;
   std::vector<char> m_lowerOutput;
 
-  Crypto::OpenSslEndNotice m_endNotice{OnOpenSslEnd, this}; // last: all other members must exist when it calls
+  Crypto::OpenSslCleanUpNotice m_endNotice{OnOpenSslEnd, this}; // last: all other members must exist when it calls
 };
 
 } // namespace Tarvel::Ssl

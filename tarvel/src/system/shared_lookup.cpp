@@ -164,7 +164,7 @@ std::shared_ptr<Lookup> StartLookup(Registry &registry, const std::string &host,
 
 /// In a child process: removes the look-ups of its parent, which never end here. Under the registry's lock.
 /// @return the callers that wait for them. They must be destroyed after the lock is released, and are never called.
-AskerList RemoveThoseOfParent(Registry &registry) {
+AskerList RemoveLookupsOfParent(Registry &registry) {
   AskerList askers;
   if (std::exchange(registry.generation, GetForkGeneration()) == GetForkGeneration()) {
     return askers;
@@ -187,7 +187,7 @@ Ref<ScheduledItem> StartSharedLookup(const std::string &host, LookupCompletion c
   Registry &registry = GetRegistry();
   AskerList ofParent;
   const std::lock_guard<ForkSafeMutex> lock(registry.mutex);
-  ofParent = RemoveThoseOfParent(registry);
+  ofParent = RemoveLookupsOfParent(registry);
   const auto found = registry.lookups.find(name);
   std::shared_ptr<Lookup> lookup;
   if (found == registry.lookups.end()) {

@@ -174,13 +174,13 @@ bool HasBracketInFragment(const Difference &difference) {
          uri.find_first_of("[]", std::min(uri.find('#'), uri.size())) != NPOS;
 }
 
-bool IsNamespaceNameThatIsNoUri(const Difference &difference) {
+bool IsInvalidNamespaceName(const Difference &difference) {
   return OnlyWeRefuseAs(difference, "the namespace name '", "' is not a URI reference") &&
          (difference.libxml2.code == XML_WAR_NS_URI || HasAddressInBrackets(difference) ||
           HasBracketInFragment(difference));
 }
 
-bool HasPortThatIsNoInt(const Difference &difference) {
+bool HasPortThatIsNotAnInt(const Difference &difference) {
   if (!OnlyTheyRefuse(difference) || difference.theirs.code != XML_WAR_NS_URI) {
     return false;
   }
@@ -224,13 +224,13 @@ const std::vector<DifferenceRule> &DifferenceRules() {
       {"we refuse too many declarations in scope", ALL, HasTooManyDeclarations},
       {"expat knows the names of the fourth edition only", BOTH_OF_EXPAT, IsNameOfFifthEdition},
       {"expat refuses an unbound prefix", EXPAT_WITH_NAMESPACES, IsUnboundPrefix},
-      {"expat does not judge whether a namespace name is a URI", BOTH_OF_EXPAT, IsNamespaceNameThatIsNoUri},
+      {"expat does not judge whether a namespace name is a URI", BOTH_OF_EXPAT, IsInvalidNamespaceName},
       {"libxml2 reads EBCDIC", LIBXML2, IsEbcdic},
       {"libxml2 ends at a null byte", LIBXML2, IsNullByte},
       {"libxml2 takes the prefix xmlns on an element for an unbound one", LIBXML2, IsPrefixXmlnsOnElement},
       {"libxml2 takes anything in brackets for an address in a namespace name", LIBXML2, HasAddressInBrackets},
       {"libxml2 accepts brackets in the fragment of a namespace name", LIBXML2, HasBracketInFragment},
-      {"libxml2 wants a port that is an int in a namespace name", LIBXML2, HasPortThatIsNoInt},
+      {"libxml2 wants a port that is an int in a namespace name", LIBXML2, HasPortThatIsNotAnInt},
       {"libxml2 needs no space after the encoding", LIBXML2, IsSpaceMissingAfterEncoding},
   };
   return rules;

@@ -27,7 +27,7 @@ namespace Uri = Tarvel::Xml::Security::CanonicalizationUri;
 using Tarvel::Ref;
 using Tarvel::Xml::Document;
 using Tarvel::Xml::Node;
-using Tarvel::Xml::Security::CanonicalMethod;
+using Tarvel::Xml::Security::CanonicalizationMethod;
 
 const std::size_t DOCUMENTS = Testing::Repetitions<std::size_t>(10000, 1000); // for each algorithm
 
@@ -71,7 +71,7 @@ struct Form {
   std::size_t apex; ///< of the part
   bool omits;
   std::size_t omitted;
-  CanonicalMethod method;
+  CanonicalizationMethod method;
   std::vector<std::string> prefixes;
 };
 
@@ -83,7 +83,7 @@ Form ChooseForm(Testing::RandomSource &random, std::string_view uri, std::size_t
   // An element above the apex is not omitted, because nothing would be left.
   const std::size_t lowest = form.isPart ? form.apex : 0;
   form.omitted = lowest + random.Below(elements - lowest);
-  EXPECT_TRUE(Tarvel::Xml::Security::FindCanonicalMethod(uri, form.method));
+  EXPECT_TRUE(Tarvel::Xml::Security::FindCanonicalizationMethod(uri, form.method));
   if (form.method.isExclusive) {
     form.prefixes = Testing::GeneratePrefixList(random);
   }

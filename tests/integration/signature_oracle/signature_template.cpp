@@ -105,7 +105,7 @@ private:
 
 /// A random place after a ">", but not where the text of a digest or signature value begins: we refuse a comment there,
 /// but other engines skip it.
-std::size_t PlaceBehindTag(const std::string &text, RandomSource &random) {
+std::size_t PlaceAfterTag(const std::string &text, RandomSource &random) {
   std::size_t at = text.find('>', random.Below(text.size()));
   while (at != std::string::npos) {
     const std::string_view tag = std::string_view(text).substr(0, at).substr(text.rfind('<', at));
@@ -155,10 +155,10 @@ std::string ChangeSomething(std::string text, RandomSource &random) {
     break;
   case 3:
   case 4:
-    text.insert(PlaceBehindTag(text, random), "<!-- new -->");
+    text.insert(PlaceAfterTag(text, random), "<!-- new -->");
     break;
   case 5:
-    text.insert(PlaceBehindTag(text, random), random.OneOf({" ", "\n", "x"}));
+    text.insert(PlaceAfterTag(text, random), random.OneOf({" ", "\n", "x"}));
     break;
   case 6:
     text.erase(random.Below(text.size()), 1 + random.Below(2));

@@ -50,17 +50,17 @@ std::string WithElements(const std::string &end, std::size_t nodes) {
   return "<r>" + REFERENCE + Repeated("<a/>", MAX_NODES - 2 - nodes) + end + "</r>";
 }
 
-constexpr std::size_t LEFT_BESIDE_ELEMENTS = MAX_DOCUMENT_BYTES - 4 * MAX_NODES - 20;
+constexpr std::size_t LEFT_AFTER_ELEMENTS = MAX_DOCUMENT_BYTES - 4 * MAX_NODES - 20;
 
 /// A text with many references, which is copied piece by piece.
 std::string DecodedInPieces() {
   const std::string piece = REFERENCE + std::string(1000, 'x');
-  return Repeated(piece, LEFT_BESIDE_ELEMENTS / piece.size());
+  return Repeated(piece, LEFT_AFTER_ELEMENTS / piece.size());
 }
 
 /// Of all texts of its length that need decoding, this one is the longest after decoding.
 std::string LongestDecoded() {
-  return REFERENCE + std::string(LEFT_BESIDE_ELEMENTS - REFERENCE.size(), 'x');
+  return REFERENCE + std::string(LEFT_AFTER_ELEMENTS - REFERENCE.size(), 'x');
 }
 
 std::string WithText() {

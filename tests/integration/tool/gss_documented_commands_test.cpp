@@ -29,7 +29,7 @@ protected:
   ~DocumentedForTickets() override { unsetenv("KERBEROS_FOLDER"); }
 
   /// Runs the examples that need a realm. @return their number
-  int RunThose(const std::vector<std::string> &examples) const {
+  int RunExamplesForTickets(const std::vector<std::string> &examples) const {
     int count = 0;
     for (const std::string &example : examples) {
       if (IsForTickets(example)) {
@@ -42,19 +42,19 @@ protected:
 };
 
 TEST_F(DocumentedForTickets, OfTheHelpRun) {
-  EXPECT_EQ(2, RunThose(ExamplesOfHelp("acquire")));
+  EXPECT_EQ(2, RunExamplesForTickets(ExamplesOfHelp("acquire")));
 }
 
 TEST_F(DocumentedForTickets, OfTheManualRun) {
-  EXPECT_EQ(2, RunThose(ExamplesOfManual()));
+  EXPECT_EQ(2, RunExamplesForTickets(ExamplesOfManual()));
 }
 
 TEST_F(DocumentedForTickets, OfThePageOnTicketsRun) {
-  EXPECT_EQ(4, RunThose(ExamplesOfPage("docs/gssapi.md")));
+  EXPECT_EQ(4, RunExamplesForTickets(ExamplesOfPage("docs/gssapi.md")));
 }
 
 TEST_F(DocumentedForTickets, OfTheReadmeRun) {
-  EXPECT_EQ(1, RunThose(ExamplesOfPage("README.md")));
+  EXPECT_EQ(1, RunExamplesForTickets(ExamplesOfPage("README.md")));
 }
 
 } // namespace

@@ -23,7 +23,7 @@ std::string OptionAt(const std::string &text, std::size_t at, const std::string 
 
 } // namespace
 
-std::set<std::string> OptionsBehind(const std::string &start, const std::string &text, const std::string &separator) {
+std::set<std::string> OptionsAfter(const std::string &start, const std::string &text, const std::string &separator) {
   std::set<std::string> options;
   for (std::size_t at = text.find(start); at != std::string::npos; at = text.find(start, at + 1)) {
     options.insert(OptionAt(text, at + start.size(), separator));
@@ -33,7 +33,7 @@ std::set<std::string> OptionsBehind(const std::string &start, const std::string 
 }
 
 std::set<std::string> OptionsOfHelp(const std::string &command) {
-  return OptionsBehind("\n  ", RunTool({command, "--help"}).out, ",");
+  return OptionsAfter("\n  ", RunTool({command, "--help"}).out, ",");
 }
 
 std::set<std::string> OptionsWithArgument(const std::string &command) {

@@ -10,7 +10,7 @@
 namespace ToolTest {
 
 /// The long options directly after each `start` in `text`, with or without a short option and `separator` in between.
-std::set<std::string> OptionsBehind(const std::string &start, const std::string &text, const std::string &separator);
+std::set<std::string> OptionsAfter(const std::string &start, const std::string &text, const std::string &separator);
 
 /// The options that begin an indented line of a command's help.
 std::set<std::string> OptionsOfHelp(const std::string &command);

@@ -34,7 +34,7 @@ std::set<std::string> OptionsOfManual() {
   std::set<std::string> options;
   for (const char *paragraph : {"\n.TP\n", "\n.TQ\n"}) {
     for (const char *fonts : {".B ", ".BI ", ".BR "}) {
-      options.merge(OptionsBehind(std::string(paragraph) + fonts, manual, " \", \" "));
+      options.merge(OptionsAfter(std::string(paragraph) + fonts, manual, " \", \" "));
     }
   }
   return options;

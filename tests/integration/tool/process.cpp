@@ -68,7 +68,7 @@ void Start(Process &process, std::vector<std::string> arguments, const std::stri
     dup2(process.in.readEnd, STDIN_FILENO);
     dup2(process.out.writeEnd, STDOUT_FILENO);
     dup2(process.err.writeEnd, STDERR_FILENO);
-    HeedSignals();
+    ResetSignals();
     if (chdir(folder.c_str()) == 0) {
       execv(raw[0], raw.data());
     }
@@ -141,7 +141,7 @@ bool Catches(pid_t id, int signal) {
 
 } // namespace
 
-void HeedSignals() {
+void ResetSignals() {
   for (const int signal : {SIGINT, SIGQUIT, SIGPIPE, SIGHUP, SIGTERM}) {
     std::signal(signal, SIG_DFL);
   }

@@ -19,7 +19,7 @@ struct Result {
 
 /// Resets signals to what they do in a shell's foreground. Called in a new process before it executes another program,
 /// since a program inherits which signals its parent ignores: a shell ignores some for background jobs.
-void HeedSignals();
+void ResetSignals();
 
 /// The words that start the tool with `arguments`.
 std::vector<std::string> ToolCommand(const std::vector<std::string> &arguments);

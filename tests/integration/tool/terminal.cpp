@@ -37,7 +37,7 @@ TerminalSession::TerminalSession(std::vector<std::string> words, const std::stri
   if (m_process == 0) {
     close(m_master);
     login_tty(m_slave);
-    HeedSignals();
+    ResetSignals();
     if (chdir(folder.c_str()) == 0) {
       execv(raw[0], raw.data());
     }

@@ -137,12 +137,12 @@ TEST(SerializeToXML, KeepsNamesAndCommentsOfAPreBuiltElementUnchanged) {
 }
 
 /// Texts that an XML 1.0 document cannot contain, escaped or not.
-const std::string UNCARRIABLE[] = {
+const std::string NOT_ALLOWED_IN_XML[] = {
     std::string("a\0b", 3), "a\x01z",         "a\bz",   "a\x0bz", "a\x1fz",   "a\xef\xbf\xbez",
     "a\xef\xbf\xbfz",       "a\xed\xa0\x80z", "a\xffz", "a\xc3",  "\xc0\x80", "\xf4\x90\x80\x80"};
 
 TEST(SerializeToXML, RefusesTextThatXmlCannotCarryAndDoesNotQuoteIt) {
-  for (const std::string &text : UNCARRIABLE) {
+  for (const std::string &text : NOT_ALLOWED_IN_XML) {
     const std::string secret = "s3cret-" + text + "-s3cret";
     try {
       SerializeToXML(TextElementBuilder("p", "e", secret));
@@ -155,7 +155,7 @@ TEST(SerializeToXML, RefusesTextThatXmlCannotCarryAndDoesNotQuoteIt) {
 }
 
 TEST(SerializeToXML, RefusesAttributeValuesThatXmlCannotCarryAndDoesNotQuoteThem) {
-  for (const std::string &text : UNCARRIABLE) {
+  for (const std::string &text : NOT_ALLOWED_IN_XML) {
     const std::string secret = "s3cret-" + text + "-s3cret";
     try {
       SerializeToXML(ElementBuilder("p", "e", {{"a", secret}}));

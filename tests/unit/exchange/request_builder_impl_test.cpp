@@ -268,21 +268,21 @@ TEST_F(RequestBuilderImplTest, SetsTheActionBeforeAndTheBodyAfterItComposesTheEn
   const RequestBuilderImpl builder(
       HolderOfKeyConfig{Tarvel::Crypto::CreatePrivateKey(ReadDataFile("tokens/sts-ec256.key")),
                         Tarvel::Crypto::CreateCertificateFromPem(ReadDataFile("tokens/sts-ec256.crt"))});
-  const auto expectActionAlone = [](const char *action, const auto &build) {
+  const auto expectOnlyAction = [](const char *action, const auto &build) {
     Request request;
     request.body = "earlier";
     EXPECT_THROW(build(request), Tarvel::Exception);
     EXPECT_EQ(request.soapAction, action);
     EXPECT_EQ(request.body, "earlier");
   };
-  expectActionAlone(Request::ISSUE, [&](Request &out) { builder.BuildUserPassTokenRequest("u", "p", Spec(), out); });
-  expectActionAlone(Request::ISSUE, [&](Request &out) { builder.BuildInitialSPNegoRequest(Spec(), LEG, out); });
-  expectActionAlone(Request::CHALLANGE, [&](Request &out) { builder.BuildContinuedSPNegoRequest("\x01", LEG, out); });
-  expectActionAlone(Request::ISSUE, [&](Request &out) { builder.BuildCertificateTokenRequest(Spec(), out); });
-  expectActionAlone(Request::ISSUE, [&](Request &out) { builder.BuildExchangeTokenRequest(HOK_TOKEN, Spec(), out); });
-  expectActionAlone(Request::VALIDATE,
+  expectOnlyAction(Request::ISSUE, [&](Request &out) { builder.BuildUserPassTokenRequest("u", "p", Spec(), out); });
+  expectOnlyAction(Request::ISSUE, [&](Request &out) { builder.BuildInitialSPNegoRequest(Spec(), LEG, out); });
+  expectOnlyAction(Request::CHALLANGE, [&](Request &out) { builder.BuildContinuedSPNegoRequest("\x01", LEG, out); });
+  expectOnlyAction(Request::ISSUE, [&](Request &out) { builder.BuildCertificateTokenRequest(Spec(), out); });
+  expectOnlyAction(Request::ISSUE, [&](Request &out) { builder.BuildExchangeTokenRequest(HOK_TOKEN, Spec(), out); });
+  expectOnlyAction(Request::VALIDATE,
                     [&](Request &out) { builder.BuildValidateSubjectRequest(UNPARSABLE_BEARER_TOKEN, out); });
-  expectActionAlone(Request::RENEW, [&](Request &out) { builder.BuildRenewRequest(HOK_TOKEN, 600, out); });
+  expectOnlyAction(Request::RENEW, [&](Request &out) { builder.BuildRenewRequest(HOK_TOKEN, 600, out); });
 }
 
 TEST_F(RequestBuilderImplTest, RefusesATextThatXmlCannotCarryWithoutQuotingThePassword) {

@@ -83,19 +83,19 @@ TYPED_TEST(SlotsOfException, AreThoseOfThePlatformsClass) {
 
 // Each class inherits the first four from the platform's class, and overrides the last two.
 template <typename Exception>
-constexpr bool OVERRIDES_CLONE_AND_THROW_ALONE =
+constexpr bool OVERRIDES_ONLY_CLONE_AND_THROW =
     std::is_same_v<decltype(&Exception::what), decltype(&Tarvel::Exception::what)>
         &&std::is_same_v<decltype(&Exception::GetBacktrace), decltype(&Tarvel::Exception::GetBacktrace)>
             &&std::is_same_v<decltype(&Exception::Dump), decltype(&Tarvel::Exception::Dump)>
                 &&std::is_same_v<decltype(&Exception::Where), decltype(&Tarvel::Exception::Where)>
                     &&std::is_same_v<decltype(&Exception::Clone), Exception *(Exception::*)() const>
                         &&std::is_same_v<decltype(&Exception::Throw), void (Exception::*)() const>;
-static_assert(OVERRIDES_CLONE_AND_THROW_ALONE<SsoException>);
-static_assert(OVERRIDES_CLONE_AND_THROW_ALONE<InvalidTokenException>);
-static_assert(OVERRIDES_CLONE_AND_THROW_ALONE<InvalidSignatureException>);
-static_assert(OVERRIDES_CLONE_AND_THROW_ALONE<ParseException>);
-static_assert(OVERRIDES_CLONE_AND_THROW_ALONE<CommunicationException>);
-static_assert(OVERRIDES_CLONE_AND_THROW_ALONE<InvalidCredentialsException>);
+static_assert(OVERRIDES_ONLY_CLONE_AND_THROW<SsoException>);
+static_assert(OVERRIDES_ONLY_CLONE_AND_THROW<InvalidTokenException>);
+static_assert(OVERRIDES_ONLY_CLONE_AND_THROW<InvalidSignatureException>);
+static_assert(OVERRIDES_ONLY_CLONE_AND_THROW<ParseException>);
+static_assert(OVERRIDES_ONLY_CLONE_AND_THROW<CommunicationException>);
+static_assert(OVERRIDES_ONLY_CLONE_AND_THROW<InvalidCredentialsException>);
 
 // No class adds a field.
 static_assert(sizeof(SsoException) == sizeof(Tarvel::Exception));

@@ -28,7 +28,7 @@ using Testing::OperationsInTurn;
 
 /// How many more bytes may be allocated at the end: OpenSSL allocates a few on first use. A leak of one byte in each of
 /// 20,000 operations would exceed it.
-constexpr std::size_t MOST_BYTES_OF_GROWTH = 16384;
+constexpr std::size_t MAX_GROWTH_BYTES = 16384;
 
 /// Answers each request at once and keeps nothing of it.
 class ForgetfulTransport final : public Transport {
@@ -80,7 +80,7 @@ void ExpectNoErrorAndNoGrowth(int count, OperationsInTurn &operations, const For
   EXPECT_EQ(transport.CountSessions(), FIRST + count);
   EXPECT_EQ(transport.CountOpenSessions(), 0);
   EXPECT_EQ(Testing::CountDescriptors(), descriptors);
-  EXPECT_LE(Testing::CountAllocatedBytes(), bytes + MOST_BYTES_OF_GROWTH);
+  EXPECT_LE(Testing::CountAllocatedBytes(), bytes + MAX_GROWTH_BYTES);
 }
 
 TEST(OneServiceOnSixteenThreads, RunsTwentyThousandOperationsWithoutErrorOrGrowth) {

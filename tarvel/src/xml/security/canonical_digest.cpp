@@ -21,7 +21,7 @@ private:
 
 } // namespace
 
-DigestValue DigestCanonicalForm(const Node &apex, const CanonicalMethod &method, const Node *omitted,
+DigestValue DigestCanonicalForm(const Node &apex, const CanonicalizationMethod &method, const Node *omitted,
                                 Crypto::DigestAlgorithm algorithm) {
   DigestWriter writer(algorithm);
   WriteCanonicalForm(apex, method, omitted, writer);

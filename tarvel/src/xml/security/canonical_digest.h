@@ -18,7 +18,7 @@ namespace Tarvel::Xml::Security {
 using DigestValue = std::array<std::uint8_t, Crypto::MAX_DIGEST_BYTES>;
 
 /// @throws what `WriteCanonicalForm` and `Crypto::Digest` throw.
-DigestValue DigestCanonicalForm(const Node &apex, const CanonicalMethod &method, const Node *omitted,
+DigestValue DigestCanonicalForm(const Node &apex, const CanonicalizationMethod &method, const Node *omitted,
                                 Crypto::DigestAlgorithm algorithm);
 
 } // namespace Tarvel::Xml::Security

@@ -92,7 +92,7 @@ struct CanonicalAttribute {
 /// Walks a subtree once and writes it.
 class CanonicalWalk {
 public:
-  CanonicalWalk(const Node &apex, const CanonicalMethod &method, const Node *omitted, Writer &writer)
+  CanonicalWalk(const Node &apex, const CanonicalizationMethod &method, const Node *omitted, Writer &writer)
       : m_apex(apex), m_method(method), m_omitted(omitted), m_output(writer) {}
 
   void Write();
@@ -128,7 +128,7 @@ private:
   }
 
   const Node &m_apex;
-  const CanonicalMethod &m_method;
+  const CanonicalizationMethod &m_method;
   const Node *const m_omitted;
   CanonicalOutput m_output;
   NamespaceBindings m_bindings;
@@ -208,7 +208,7 @@ void CanonicalWalk::Close(const Node &node) {
     return;
   }
   m_output.Put("</", element->GetName(), ">");
-  m_bindings.GoBack(m_openElements.back());
+  m_bindings.RestoreTo(m_openElements.back());
   m_openElements.pop_back();
   m_documentElementWritten = m_openElements.empty();
 }
@@ -350,7 +350,7 @@ bool CanonicalWalk::IsInclusivePrefix(std::string_view prefix) const {
 
 } // namespace
 
-bool FindCanonicalMethod(std::string_view algorithmUri, CanonicalMethod &method) {
+bool FindCanonicalizationMethod(std::string_view algorithmUri, CanonicalizationMethod &method) {
   const bool isExclusive =
       algorithmUri == CanonicalizationUri::EXCLUSIVE || algorithmUri == CanonicalizationUri::EXCLUSIVE_WITH_COMMENTS;
   const bool withComments = algorithmUri == CanonicalizationUri::INCLUSIVE_WITH_COMMENTS ||
@@ -359,17 +359,17 @@ bool FindCanonicalMethod(std::string_view algorithmUri, CanonicalMethod &method)
       algorithmUri != INCLUSIVE_WITH_LONE_NUMBER_SIGN) {
     return false;
   }
-  method = CanonicalMethod{isExclusive, withComments, {}};
+  method = CanonicalizationMethod{isExclusive, withComments, {}};
   return true;
 }
 
-void SetInclusivePrefixes(CanonicalMethod &method, std::vector<std::string> prefixList) {
+void SetInclusivePrefixes(CanonicalizationMethod &method, std::vector<std::string> prefixList) {
   std::replace(prefixList.begin(), prefixList.end(), std::string("#default"), std::string());
   std::sort(prefixList.begin(), prefixList.end());
   method.inclusivePrefixes = std::move(prefixList);
 }
 
-void WriteCanonicalForm(const Node &apex, const CanonicalMethod &method, const Node *omitted, Writer &writer) {
+void WriteCanonicalForm(const Node &apex, const CanonicalizationMethod &method, const Node *omitted, Writer &writer) {
   CanonicalWalk(apex, method, omitted, writer).Write();
 }
 

@@ -15,14 +15,14 @@ namespace {
 
 class CanonicalizerImpl final : public Canonicalizer {
 public:
-  explicit CanonicalizerImpl(CanonicalMethod method) : m_method(std::move(method)) {}
+  explicit CanonicalizerImpl(CanonicalizationMethod method) : m_method(std::move(method)) {}
 
   void Canonicalize(const Node &node, Writer &writer) const override {
     WriteCanonicalForm(node, m_method, nullptr, writer);
   }
 
 private:
-  const CanonicalMethod m_method;
+  const CanonicalizationMethod m_method;
 };
 
 } // namespace
@@ -31,8 +31,8 @@ Canonicalizer::~Canonicalizer() = default;
 
 Ref<Canonicalizer> CreateCanonicalizer(std::string_view algorithmUri,
                                        const std::vector<std::string> &inclusivePrefixes) {
-  CanonicalMethod method;
-  if (!FindCanonicalMethod(algorithmUri, method)) {
+  CanonicalizationMethod method;
+  if (!FindCanonicalizationMethod(algorithmUri, method)) {
     throw XmlSecurityException("The canonicalization algorithm \"" + StringUtil::Shorten(algorithmUri) +
                                "\" is not accepted");
   }

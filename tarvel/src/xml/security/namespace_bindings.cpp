@@ -52,7 +52,7 @@ std::size_t NamespaceBindings::Search(std::string_view prefix) noexcept {
   return NOT_BOUND;
 }
 
-bool NamespaceBindings::WriteAnew(std::size_t index) {
+bool NamespaceBindings::MarkAsWritten(std::size_t index) {
   Binding &binding = m_bindings[index];
   if (binding.isWritten && binding.written == binding.uri) {
     return false;
@@ -63,7 +63,7 @@ bool NamespaceBindings::WriteAnew(std::size_t index) {
   return true;
 }
 
-void NamespaceBindings::Undo(Mark mark) noexcept {
+void NamespaceBindings::Restore(Mark mark) noexcept {
   while (m_changes.size() > mark.changes) {
     const Change &change = m_changes.back();
     m_bindings[change.index].written = change.written;

@@ -26,7 +26,7 @@ public:
     std::uint32_t next = 0; ///< the next older binding in the same bucket
   };
 
-  /// A state that `GoBack` restores.
+  /// A state that `RestoreTo` restores.
   struct Mark {
     std::size_t bindings;
     std::size_t changes;
@@ -52,13 +52,13 @@ public:
     // If nothing was declared since, both are views of the same text.
     const bool isSameText =
         binding.written.data() == binding.uri.data() && binding.written.size() == binding.uri.size();
-    return !(binding.isWritten && isSameText) && WriteAnew(index);
+    return !(binding.isWritten && isSameText) && MarkAsWritten(index);
   }
 
   Mark GetMark() const noexcept { return {m_bindings.size(), m_changes.size()}; }
-  void GoBack(Mark mark) noexcept {
+  void RestoreTo(Mark mark) noexcept {
     if (m_changes.size() != mark.changes || m_bindings.size() != mark.bindings) {
-      Undo(mark);
+      Restore(mark);
     }
   }
 
@@ -77,8 +77,8 @@ private:
 
   static std::uint32_t BucketOf(std::string_view prefix) noexcept;
   std::size_t Search(std::string_view prefix) noexcept;
-  bool WriteAnew(std::size_t index);
-  void Undo(Mark mark) noexcept;
+  bool MarkAsWritten(std::size_t index);
+  void Restore(Mark mark) noexcept;
 
   std::size_t m_recent = NOT_BOUND; // the binding found last, while it is in scope; the next search is usually for it
   std::array<std::uint32_t, BUCKETS> m_buckets;

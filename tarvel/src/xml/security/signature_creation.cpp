@@ -155,7 +155,7 @@ void BlankSignature::AppendReference(ElementNode &signedInfo, std::size_t index,
   reference.DefineAttribute("URI", m_references[index].uri);
   AppendMethod(*reference.AppendElement(m_prefix, "Transforms"), "Transform", CanonicalizationUri::EXCLUSIVE);
   AppendMethod(reference, "DigestMethod", digestMethod.uri);
-  CanonicalMethod method;
+  CanonicalizationMethod method;
   method.isExclusive = true;
   const DigestValue digest = DigestCanonicalForm(target, method, nullptr, digestMethod.algorithm);
   AppendText(reference, "DigestValue",
@@ -164,7 +164,7 @@ void BlankSignature::AppendReference(ElementNode &signedInfo, std::size_t index,
 
 std::vector<std::uint8_t> BlankSignature::SignatureValue(const ElementNode &signedInfo,
                                                          const Crypto::PrivateKey &key) const {
-  CanonicalMethod method;
+  CanonicalizationMethod method;
   method.isExclusive = true;
   const DigestValue digest = DigestCanonicalForm(signedInfo, method, nullptr, m_algorithm.digest);
   return Crypto::SignDigest(key, m_algorithm.scheme, m_algorithm.digest, digest.data());

@@ -86,9 +86,9 @@ std::vector<std::string> RequirePrefixes(std::string_view list, std::string_view
   return prefixes;
 }
 
-CanonicalMethod RequireCanonicalMethod(const char *kind, const AlgorithmSyntax &syntax) {
-  CanonicalMethod method;
-  if (!FindCanonicalMethod(syntax.uri, method)) {
+CanonicalizationMethod RequireCanonicalMethod(const char *kind, const AlgorithmSyntax &syntax) {
+  CanonicalizationMethod method;
+  if (!FindCanonicalizationMethod(syntax.uri, method)) {
     RefuseAlgorithm(kind, syntax.uri);
   }
   if (!method.isExclusive || !syntax.otherParameter.empty()) {

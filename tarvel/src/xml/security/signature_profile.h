@@ -23,12 +23,12 @@ struct SignatureAlgorithm {
 /// How the digest of a reference is computed from its target.
 struct ReferencePlan {
   bool omitsSignature = false; ///< the enveloped-signature transform
-  CanonicalMethod method;      ///< never with comments: same-document references leave them out
+  CanonicalizationMethod method;      ///< never with comments: same-document references leave them out
   Crypto::DigestAlgorithm digest = Crypto::DigestAlgorithm::SHA256;
 };
 
 struct SignaturePlan {
-  CanonicalMethod signedInfoMethod;
+  CanonicalizationMethod signedInfoMethod;
   SignatureAlgorithm algorithm;
   std::vector<ReferencePlan> references; ///< in the order of the syntax
 };

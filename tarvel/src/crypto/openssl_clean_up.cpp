@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 
-#include "crypto/openssl_end.h"
+#include "crypto/openssl_clean_up.h"
 
 #include "core/fork_gate.h"
 
@@ -12,11 +12,11 @@ namespace {
 
 // Constant-initialised and never destroyed.
 ForkSafeMutex mutex;               // guards the list
-OpenSslEndNotice *first = nullptr; // the newest
+OpenSslCleanUpNotice *first = nullptr; // the newest
 
 } // namespace
 
-OpenSslEndNotice::OpenSslEndNotice(Function function, void *owner) noexcept : m_function(function), m_owner(owner) {
+OpenSslCleanUpNotice::OpenSslCleanUpNotice(Function function, void *owner) noexcept : m_function(function), m_owner(owner) {
   const std::lock_guard<ForkSafeMutex> lock(mutex);
   m_next = first;
   if (m_next) {
@@ -25,7 +25,7 @@ OpenSslEndNotice::OpenSslEndNotice(Function function, void *owner) noexcept : m_
   first = this;
 }
 
-void OpenSslEndNotice::Withdraw() noexcept {
+void OpenSslCleanUpNotice::Withdraw() noexcept {
   const std::lock_guard<ForkSafeMutex> lock(mutex);
   if (first == this) {
     first = m_next;
@@ -39,9 +39,9 @@ void OpenSslEndNotice::Withdraw() noexcept {
   m_previous = m_next = nullptr;
 }
 
-void OpenSslEndNotice::CallAll() noexcept {
+void OpenSslCleanUpNotice::CallAll() noexcept {
   const std::lock_guard<ForkSafeMutex> lock(mutex);
-  while (OpenSslEndNotice *const notice = first) {
+  while (OpenSslCleanUpNotice *const notice = first) {
     first = notice->m_next;
     if (first) {
       first->m_previous = nullptr;

@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// `OpenSslEndNotice`, for objects whose operations would wait forever once OpenSSL has cleaned itself up.
+/// `OpenSslCleanUpNotice`, for objects whose operations would wait forever once OpenSSL has cleaned itself up.
 
 #pragma once
 
@@ -11,16 +11,16 @@ namespace Tarvel::Crypto {
 /// Calls a function when OpenSSL cleans itself up. The call is on the thread that runs the clean-up, when no use of
 /// OpenSSL can begin any more, and those under way have ended or were waited for long enough. The function is not
 /// called in a child process that is forked later.
-class OpenSslEndNotice {
+class OpenSslCleanUpNotice {
 public:
   using Function = void (*)(void *owner) noexcept;
 
   /// Until `Withdraw` has returned, `function` may be called with `owner`, at most once. The function must not create
   /// or withdraw a notice.
-  OpenSslEndNotice(Function function, void *owner) noexcept;
-  OpenSslEndNotice(const OpenSslEndNotice &) = delete;
-  OpenSslEndNotice &operator=(const OpenSslEndNotice &) = delete;
-  ~OpenSslEndNotice() { Withdraw(); }
+  OpenSslCleanUpNotice(Function function, void *owner) noexcept;
+  OpenSslCleanUpNotice(const OpenSslCleanUpNotice &) = delete;
+  OpenSslCleanUpNotice &operator=(const OpenSslCleanUpNotice &) = delete;
+  ~OpenSslCleanUpNotice() { Withdraw(); }
 
   /// Ends the notice, after waiting for a call that is under way. May be called any number of times.
   void Withdraw() noexcept;
@@ -33,8 +33,8 @@ private:
   void *const m_owner;
   const unsigned m_generation = GetForkGeneration();
   // The neighbours in a list of all notices. A mutex guards the list.
-  OpenSslEndNotice *m_previous = nullptr;
-  OpenSslEndNotice *m_next = nullptr;
+  OpenSslCleanUpNotice *m_previous = nullptr;
+  OpenSslCleanUpNotice *m_next = nullptr;
 };
 
 } // namespace Tarvel::Crypto
