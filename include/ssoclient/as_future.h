@@ -21,7 +21,7 @@ namespace SsoClient {
 /// The parts of `AsFuture` that depend on the kind of completion. Not for callers.
 namespace FutureDetails {
 
-/// Stores how an operation ended, `failure` in its own class, in `promise`.
+/// Stores the outcome of an operation in `promise`: `result`, or a copy of `failure` with its own class.
 template <typename Result>
 void Fulfil(std::promise<Result> &promise, const Result &result, const Tarvel::Exception *failure) {
   if (!failure) {
@@ -85,7 +85,8 @@ auto AsFuture(const SecurityTokenService &service, void (SecurityTokenService::*
   using Result = FutureDetails::ResultOf<Completion>;
   auto promise = std::make_shared<std::promise<typename Result::Type>>();
   auto future = promise->get_future();
-  // From here on, the completion alone owns the promise. When it is destroyed without having been called, the promise is broken.
+  // From here on, only the completion owns the promise. If it is destroyed without having been called, the promise is
+  // broken.
   const auto completion = Result::Keep(std::exchange(promise, nullptr));
   (service.*operation)(std::forward<Arguments>(arguments)..., completion);
   return future;

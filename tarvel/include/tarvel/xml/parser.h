@@ -53,8 +53,8 @@ class TARVEL_API XMLParser : public Object {
 public:
   /// Reads `reader` to its end and returns what the handler made of the document.
   /// @throws XMLParseException when the document is refused; the handler then has no result.
-  /// @throws IOException when the reader fails. @throws std::bad_alloc when memory runs out, which is no verdict on the
-  ///         document.
+  /// @throws IOException when the reader fails. @throws std::bad_alloc when memory runs out, which says nothing about
+  ///         the document.
   virtual Ref<Object> Parse(Reader &reader) = 0;
 
 protected:
