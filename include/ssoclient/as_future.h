@@ -75,7 +75,7 @@ struct ResultOf<const SecurityTokenService::ValidityCompletion &> {
 /// may need the thread that waits. After `fork`, the child must not wait for a future of its parent, which never becomes ready
 /// there.
 /// @param operation one of the operations of `SecurityTokenService` with "Async"
-/// @param arguments all its arguments but the completion. The operation copies or shares them.
+/// @param arguments all its arguments except the completion. The operation copies or shares them.
 /// @throws what `operation` throws itself, for example Tarvel::InvalidStateException when the pool cannot start a thread.
 template <typename... Parameters, typename... Arguments>
 auto AsFuture(const SecurityTokenService &service, void (SecurityTokenService::*operation)(Parameters...) const,

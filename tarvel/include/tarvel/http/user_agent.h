@@ -95,7 +95,7 @@ public:
 
   /// Connects, sends and reads the response, without blocking. There is no time-out: a caller that does not call
   /// `WaitForRequest` must cancel the item itself when the request takes too long. Redirects are not followed. At most
-  /// 16 interim responses (1xx but 101) are skipped; one more is an HttpException. A status other than 2xx and 500 is
+  /// 16 interim responses (1xx except 101) are skipped; one more is an HttpException. A status other than 2xx and 500 is
   /// reported as soon as its header has arrived. Content is not decoded: the request accepts no coding, and a 2xx or
   /// 500 response whose content has one is a failure. Bytes after the response are ignored. The request's body is wiped
   /// after it is sent.

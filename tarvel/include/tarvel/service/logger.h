@@ -33,7 +33,7 @@ public:
   /// writing at that moment may still reach the earlier sink.
   virtual void SetSink(LogSink sink) = 0;
 
-  /// Hands `record` to the sink, if there is one. Never throws.
+  /// Passes `record` to the sink, if there is one. Never throws.
   virtual void Write(const LogRecord &record) noexcept = 0;
 
   /// Whether a sink is installed.
