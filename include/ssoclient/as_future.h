@@ -21,7 +21,7 @@ namespace SsoClient {
 /// The parts of `AsFuture` that depend on the kind of completion. Not for callers.
 namespace FutureDetails {
 
-/// Stores how an operation ended, `failure` in its own class, in `promise`.
+/// Stores the outcome of an operation in `promise`: `result`, or a copy of `failure` with its own class.
 template <typename Result>
 void Fulfil(std::promise<Result> &promise, const Result &result, const Tarvel::Exception *failure) {
   if (!failure) {
@@ -75,7 +75,7 @@ struct ResultOf<const SecurityTokenService::ValidityCompletion &> {
 /// may need the thread that waits. After `fork`, the child must not wait for a future of its parent, which never becomes ready
 /// there.
 /// @param operation one of the operations of `SecurityTokenService` with "Async"
-/// @param arguments all its arguments but the completion. The operation copies or shares them.
+/// @param arguments all its arguments except the completion. The operation copies or shares them.
 /// @throws what `operation` throws itself, for example Tarvel::InvalidStateException when the pool cannot start a thread.
 template <typename... Parameters, typename... Arguments>
 auto AsFuture(const SecurityTokenService &service, void (SecurityTokenService::*operation)(Parameters...) const,
@@ -85,7 +85,8 @@ auto AsFuture(const SecurityTokenService &service, void (SecurityTokenService::*
   using Result = FutureDetails::ResultOf<Completion>;
   auto promise = std::make_shared<std::promise<typename Result::Type>>();
   auto future = promise->get_future();
-  // From here on, the completion alone owns the promise. When it is destroyed without having been called, the promise is broken.
+  // From here on, only the completion owns the promise. If it is destroyed without having been called, the promise is
+  // broken.
   const auto completion = Result::Keep(std::exchange(promise, nullptr));
   (service.*operation)(std::forward<Arguments>(arguments)..., completion);
   return future;

@@ -40,7 +40,7 @@ SSOCLIENT_API std::shared_ptr<const SamlToken>
 CreateSamlToken(const std::string &xml, const Tarvel::Crypto::CertificateList &trustedCertificates);
 
 /// The same with one trusted certificate, which must be the object of a `Tarvel::Ref`. The call holds a reference to it only
-/// until it returns. Null trusts nothing: no token is accepted, and a token without other faults ends in
+/// until it returns. With null no key is trusted, so no token is accepted: a token without other faults causes an
 /// InvalidSignatureException.
 SSOCLIENT_API std::shared_ptr<const SamlToken> CreateSamlToken(const std::string &xml,
                                                                const Tarvel::Crypto::Certificate *certificate);

@@ -43,8 +43,8 @@ SSOCLIENT_API std::string WriteAdvice(const Advice *advice);
 /// All fields of a specification. The text is not secret, but contains the names of principals.
 SSOCLIENT_API std::string WriteTokenSpec(const TokenSpec &spec);
 
-/// A description of a token for logs. It never contains its identifier, XML, signature, certificate, audience or advice, nor
-/// the full name of the subject.
+/// A description of a token for logs. It never contains the token's identifier, XML, signature, certificate, audience
+/// or advice, nor the full name of the subject.
 SSOCLIENT_API std::string CreateRedactedDescription(const SamlToken &token);
 
 } // namespace SsoClient

@@ -2,8 +2,8 @@
 /// @file
 /// The exceptions of the client.
 ///
-/// `SsoException` is the base of these classes only. The library also throws exceptions of the platform, which are not below
-/// it: `Tarvel::InvalidArgumentException`, `Tarvel::InvalidStateException`, `Tarvel::OutOfMemoryException`,
+/// `SsoException` is the base of these classes only. The library also throws exceptions of the platform, which do not
+/// derive from it: `Tarvel::InvalidArgumentException`, `Tarvel::InvalidStateException`, `Tarvel::OutOfMemoryException`,
 /// `Tarvel::Http::MalformedURLException`, `Tarvel::Xml::XMLParseException` and
 /// `Tarvel::Xml::Security::XmlSecurityException`. Catch `Tarvel::Exception`, the base of all of them, to catch every failure
 /// of the library except `std::bad_alloc`.
@@ -20,8 +20,8 @@
 
 namespace SsoClient {
 
-/// Any failure of an operation that has no class of its own. When the service answers with a fault, the message is
-/// "Unexpected SOAP fault: CODE; request failed.", where CODE is the fault code as the service wrote it.
+/// A failure of an operation for which there is no more specific class. When the service answers with a fault, the
+/// message is "Unexpected SOAP fault: CODE; request failed.", where CODE is the fault code as the service wrote it.
 class SSOCLIENT_API SsoException : public Tarvel::Exception {
   TARVEL_EXCEPTION_BODY(SsoException, Tarvel::Exception);
 };
@@ -37,14 +37,16 @@ class SSOCLIENT_API InvalidSignatureException : public InvalidTokenException {
   TARVEL_EXCEPTION_BODY(InvalidSignatureException, InvalidTokenException);
 };
 
-/// A token that does not have the form of a token, or is inconsistent, expired or not valid yet. An expired token's message
-/// begins with "The token has expired at: ", that of a token that is not valid yet with "Token start date is in the future: ".
+/// A token that does not have the form of a token, or is inconsistent, expired or not valid yet. The message begins
+/// with "The token has expired at: " for an expired token, and with "Token start date is in the future: " for one that
+/// is not valid yet.
 class SSOCLIENT_API ParseException : public InvalidTokenException {
   TARVEL_EXCEPTION_BODY(ParseException, InvalidTokenException);
 };
 
-/// The service cannot be reached, the connection failed or took too long, or the HTTP status is an error. The last of these
-/// has the message "Server returned error: CODE REASON", where CODE is the status in decimal. Other texts may change.
+/// The service cannot be reached, the connection failed or took too long, or the HTTP status is an error. For such a
+/// status, the message is "Server returned error: CODE REASON", where CODE is the status in decimal. Other texts may
+/// change.
 class SSOCLIENT_API CommunicationException : public SsoException {
   TARVEL_EXCEPTION_BODY(CommunicationException, SsoException);
 };

@@ -17,21 +17,22 @@ namespace SsoClient::InternalApi {
 
 /// The service's response to one leg.
 struct GssNegotiationResult {
-  /// The service's GSS output token; empty when the service sent none. Never null. The caller owns it alone.
+  /// The service's GSS output token; empty when the service sent none. Never null. The library keeps no reference to
+  /// it.
   std::shared_ptr<std::vector<std::uint8_t>> serverLeg;
   /// The issued token; null until the negotiation is complete.
   std::shared_ptr<const SamlToken> token;
 };
 
-/// One negotiation in one session. It cannot be used for a second negotiation. One thread at a time may use it. Always held by
-/// the shared pointer that `CreateGssNegotiationContext` returned.
+/// One negotiation in one session. It cannot be used for a second negotiation. One thread at a time may use it. It is
+/// always owned by the shared pointer that `CreateGssNegotiationContext` returned.
 class SSOCLIENT_API GssNegotiationContext {
 public:
   /// Sends the client's leg and waits up to 40 seconds for the service's response.
   /// @param leg the caller's GSS output token; may be empty
-  /// @throws what the operations of `SecurityTokenService` throw, but ParseException for a token that is malformed,
-  ///         expired or not valid yet. After an exception the negotiation is in the state after the last leg that
-  ///         was answered.
+  /// @throws what the operations of `SecurityTokenService` throw, with one difference: ParseException, not
+  ///         SsoException, for a token that is malformed, expired or not valid yet. After an exception, the negotiation
+  ///         is in the state that it had after the last leg that was answered.
   virtual GssNegotiationResult NegotiateToken(const std::vector<std::uint8_t> &leg) = 0;
 
 protected:

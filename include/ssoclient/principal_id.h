@@ -27,8 +27,8 @@ struct SSOCLIENT_API PrincipalId {
 SSOCLIENT_API bool operator==(const PrincipalId &left, const PrincipalId &right);
 SSOCLIENT_API bool operator!=(const PrincipalId &left, const PrincipalId &right);
 
-/// An order for sets and maps, by name and then by domain. It compares the same upper-case forms as `==`: of two principals
-/// neither is less exactly when they are equal.
+/// An order for sets and maps, by name and then by domain. It compares the same upper-case forms as `==`: two
+/// principals are equal exactly when neither is less than the other.
 struct SSOCLIENT_API PrincipalIdLess {
   bool operator()(const PrincipalId &left, const PrincipalId &right) const;
 };

@@ -19,9 +19,9 @@
 
 namespace SsoClient {
 
-/// A parsed, checked and verified token. Immutable: any number of threads may read it. Always held by the shared pointer to
-/// const that `CreateSamlToken` or an operation of the service returned; a pointer to this interface cannot be deleted. What
-/// is returned by reference or pointer belongs to the token and is valid as long as the token.
+/// A parsed, checked and verified token. Immutable: any number of threads may read it. It is always owned by the shared
+/// pointer to const that `CreateSamlToken` or an operation of the service returned; a pointer to this interface cannot
+/// be deleted. What is returned by reference or pointer belongs to the token and is valid as long as the token.
 class SSOCLIENT_API SamlToken {
 public:
   /// How the sender of the token proves to be its subject.
@@ -87,7 +87,8 @@ public:
   /// The certificate of a holder-of-key token: its sender must prove possession of the private key. Null for a bearer token.
   virtual const Tarvel::Crypto::Certificate *GetConfirmationCertificate() const = 0;
 
-  /// The token's XML, which can be sent to a service. That of a bearer token is secret: everyone who has it can use it.
+  /// The token's XML, which can be sent to a service. The XML of a bearer token is secret: anyone who has it can use
+  /// the token.
   virtual const std::string &ToXml() const = 0;
 
 protected:

@@ -20,8 +20,8 @@
 
 namespace SsoClient {
 
-/// Acquires, renews and validates tokens. Immutable: any number of threads may use one service at once. Always held by the
-/// shared pointer that `CreateSecurityTokenService` returned.
+/// Acquires, renews and validates tokens. Immutable: any number of threads may use one service at once. It is always
+/// owned by the shared pointer that `CreateSecurityTokenService` returned.
 ///
 /// The operations without "Async" run on the caller's thread. They wait up to four minutes for each message, and throw
 /// - `InvalidCredentialsException` when the service refuses the caller's credentials,
@@ -44,18 +44,18 @@ namespace SsoClient {
 /// All of these are `Tarvel::Exception`. Nothing is retried. A returned token is null only when the response contains an empty
 /// text instead of a token.
 ///
-/// The operations with "Async" return at once: nothing has been composed or sent by then. They run the operation without
-/// "Async" on a thread of the platform's pool. They cannot be cancelled. They copy or share all arguments, so the caller may
-/// release them, and the service, at once. A null token or handler is reported to the completion as
-/// `Tarvel::InvalidArgumentException`. Each throws `Tarvel::InvalidStateException` when the pool has no thread and cannot start
-/// one; it then does not call the completion. `AsFuture` turns them into futures.
+/// The operations with "Async" return at once: they compose and send nothing on the caller's thread. They run the
+/// operation without "Async" on a thread of the platform's pool. They cannot be cancelled. They copy or share all
+/// arguments, so the caller may release them, and the service, at once. A null token or handler is reported to the
+/// completion as `Tarvel::InvalidArgumentException`. Each throws `Tarvel::InvalidStateException` when the pool has no
+/// thread and cannot start one; it then does not call the completion. `AsFuture` turns them into futures.
 ///
 /// A completion must not wait for another asynchronous operation. The pool has at most 256 threads; when the completions on
-/// all of them wait, the operations for which they wait never start. Start the next operation and return, or call the operation
-/// without "Async": a completion may do so.
+/// all of them wait, the operations that they wait for never start. Start the next operation from the completion and
+/// return, or call the operation without "Async", which a completion may do.
 ///
-/// A child process made by `fork` may use the services of its parent, even while the parent has operations under way. Those
-/// continue in the parent only, and none of their completions runs in the child.
+/// A child process made by `fork` may use the services of its parent, even while the parent has operations under way.
+/// These operations continue in the parent only, and none of their completions runs in the child.
 class SSOCLIENT_API SecurityTokenService {
 public:
   /// Called once when an asynchronous operation ends, on a thread of the pool, possibly before the call that started the
@@ -63,7 +63,8 @@ public:
   /// `token` is null, and `failure` is valid during the call only (`Clone` makes a copy to keep).
   ///
   /// **It is not called at all when the operation ends with an exception that is not a `Tarvel::Exception`**: `std::bad_alloc`,
-  /// or a class of a negotiation handler's own. The pool logs such an exception, and also whatever the completion throws.
+  /// or a class of a negotiation handler's own. The pool logs such an exception, and also anything that the completion
+  /// throws.
   using TokenCompletion =
       std::function<void(const std::shared_ptr<const SamlToken> &token, const Tarvel::Exception *failure)>;
 
@@ -81,7 +82,7 @@ public:
   virtual std::shared_ptr<const SamlToken> AcquireTokenByGSS(const TokenSpec &spec,
                                                              NegotiationHandler &handler) const = 0;
 
-  /// Acquires a token by the configured holder-of-key identity alone. The confirmation of `spec` must be the default.
+  /// Acquires a token by the configured holder-of-key identity only. The confirmation of `spec` must be the default.
   virtual std::shared_ptr<const SamlToken> AcquireTokenByCertificate(const TokenSpec &spec) const = 0;
 
   /// Exchanges `token` for another one, delegated if `spec` asks for it. Needs a holder-of-key identity.

@@ -17,8 +17,8 @@ class SSLContext;
 
 namespace SsoClient {
 
-/// What is needed to create the client of a token service. It may be changed or destroyed once the call that got it has
-/// returned: the call copies all fields, and takes its own reference to the SSL context.
+/// What is needed to create the client of a token service. It may be changed or destroyed when the call to which it was
+/// passed has returned: the call copies all fields, and takes its own reference to the SSL context.
 struct SecurityTokenServiceConfig {
   /// The address of the service. Its scheme is https or http.
   std::string stsUrl;
@@ -30,11 +30,13 @@ struct SecurityTokenServiceConfig {
   /// The identity that signs requests and to which holder-of-key tokens are bound. Without it, requests are not signed and
   /// tokens are bearer tokens.
   boost::optional<HolderOfKeyConfig> holderOfKeyConfig;
-  /// The context for HTTPS connections, required when `stsUrl` is an HTTPS URL. This record does not own it: it must exist when
-  /// a service or a negotiation context is created from this record. Each of them takes a reference and holds it for its own
-  /// life, so the caller may release its own `Tarvel::Ref` as soon as it is created, or keep it longer.
+  /// The context for HTTPS connections, required when `stsUrl` is an HTTPS URL. This record does not own it: the
+  /// context must exist when a service or a negotiation context is created from this record. The service or negotiation
+  /// context takes its own reference and keeps it as long as it exists. The caller may then release its `Tarvel::Ref`,
+  /// or keep it longer.
   Tarvel::Ssl::SSLContext *sslContext = nullptr;
-  /// Connects to a domain controller instead of the host of `stsUrl` when the name of one is known; see `GetOstrelDCName`.
+  /// Connects to the domain controller that `GetOstrelDCName` returns instead of the host of `stsUrl`, if it returns
+  /// one.
   bool useDomainControllerName = false;
 };
 

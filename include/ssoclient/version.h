@@ -31,9 +31,9 @@
 
 namespace SsoClient {
 
-/// The version of the library that the program runs with, such as "0.1.0". It is valid as long as the process and differs from
-/// `SSOCLIENT_VERSION_STRING` when the program was compiled with the headers of another version. Any thread may call this, also
-/// before `main`.
+/// The version of the library that the program runs with, such as "0.1.0". The text is valid until the process ends. It
+/// differs from `SSOCLIENT_VERSION_STRING` when the program was compiled with the headers of another version. Any
+/// thread may call this, even before `main`.
 SSOCLIENT_API const char *GetLibraryVersion() noexcept;
 
 /// The same as a number, to compare with `SSOCLIENT_VERSION_NUMBER`. While the major version is 0, a program needs a library of the

@@ -24,8 +24,8 @@ struct SpnegoSettings {
   /// the default one from the environment variable KRB5CCNAME when that is set.
   std::string credentialCache;
   /// A keytab to get a ticket with, such as "FILE:/etc/example/client.keytab"; empty for none. The ticket is kept in
-  /// `credentialCache`, and replaced there when it has expired. Without a cache the ticket is kept in memory until the
-  /// handler is destroyed, and the default cache is neither read nor written.
+  /// `credentialCache`, and replaced there when it has expired. If `credentialCache` is empty, the ticket is kept in
+  /// memory until the handler is destroyed, and the default cache is neither read nor written.
   std::string clientKeytab;
   /// Asks for the three-leg form of Kerberos (DCE style), in which the client confirms the service's answer with a
   /// further leg. Only for services that expect it.
@@ -44,7 +44,7 @@ struct SpnegoSettings {
 ///
 /// `NegotiateLeg` makes the first leg when it is called with an empty leg of the service. That call asks the realm for
 /// tickets, and takes as long as the Kerberos library waits for an answer. It throws
-/// - `GssCredentialException`, `GssNegotiationException` and `GssLimitException`, as their comments say,
+/// - `GssCredentialException`, `GssNegotiationException` and `GssLimitException` (see their comments),
 /// - `Tarvel::InvalidArgumentException` when the service's leg is not empty in the first call,
 /// - `Tarvel::InvalidStateException` when an earlier call has failed.
 ///
@@ -53,11 +53,11 @@ struct SpnegoSettings {
 class SSOCLIENT_GSSAPI_API SpnegoHandler : public NegotiationHandler {
 public:
   /// Whether the negotiation is complete and the service has proved its identity. A service may issue a token and leave
-  /// out the final leg, which holds this proof. The token is valid all the same if it is signed with a trusted
-  /// certificate. Call this after the operation has returned if you need proof of the service's identity.
+  /// out the final leg, which contains this proof. The token is still valid if it is signed with a trusted certificate.
+  /// Call this after the operation has returned if you need proof of the service's identity.
   virtual bool IsMutuallyAuthenticated() const noexcept = 0;
 
-  /// @throws GssNegotiationException unless `IsMutuallyAuthenticated`.
+  /// @throws GssNegotiationException unless `IsMutuallyAuthenticated` returns true.
   virtual void RequireMutualAuthentication() const = 0;
 
 protected:

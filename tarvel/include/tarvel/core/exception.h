@@ -24,7 +24,7 @@ public:
   /// The message; valid as long as the exception. Never null.
   const char *what() const noexcept override;
 
-  /// The call stack at construction, one frame a line, symbolised where possible. Slow: for diagnostics only.
+  /// The call stack at construction, one frame on each line, with symbols where possible. Slow: for diagnostics only.
   virtual std::string GetBacktrace() const;
 
   /// Class, message and call stack in one text, for a diagnostic dump.
@@ -41,7 +41,7 @@ public:
   /// call.
   std::unique_ptr<Exception> Copy() const;
 
-  /// Throws a copy as its own dynamic class, so that a holder of a base reference rethrows the precise type.
+  /// Throws a copy of the same dynamic class, so that code that has a reference to a base class throws the exact class.
   [[noreturn]] virtual void Throw() const;
 
 protected:
@@ -85,14 +85,14 @@ public:
   [[noreturn]] void Throw() const override;
 };
 
-/// An operation on an object that is not in the state for it. Also any operation that needs OpenSSL after OpenSSL has
+/// An operation that the state of its object does not allow. Also any operation that needs OpenSSL after OpenSSL has
 /// cleaned itself up, with the message "OpenSSL has cleaned itself up: the process is about to end"; this says nothing
-/// about the data that the operation was given.
+/// about the data that was passed to the operation.
 class TARVEL_API InvalidStateException : public Exception {
   TARVEL_EXCEPTION_BODY(InvalidStateException, Exception);
 };
 
-/// An object that is not of the class that is asked for.
+/// An object that is not of the requested class.
 class TARVEL_API TypeMismatchException : public Exception {
   TARVEL_EXCEPTION_BODY(TypeMismatchException, Exception);
 };

@@ -13,8 +13,8 @@
 namespace Tarvel {
 
 /// One argument of a message, as text. To make a type usable as an argument, define an overload of
-/// `FormatMessageArgument` in its own namespace, which is found by argument-dependent look-up and returns
-/// `std::string`. Texts, numbers, Booleans ("true", "false") and pointers (hexadecimal, "(null)" when null) have theirs
+/// `FormatMessageArgument` that returns `std::string`, in the type's own namespace, where argument-dependent look-up
+/// finds it. Texts, numbers, Booleans ("true", "false") and pointers (hexadecimal, "(null)" when null) have an overload
 /// already.
 namespace MessageArguments {
 

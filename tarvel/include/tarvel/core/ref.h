@@ -15,7 +15,7 @@
 namespace Tarvel {
 
 /// Base of the platform's shared objects: a thread-safe count of the references to it. An object starts with no
-/// reference and is destroyed, through its virtual destructor, on the thread that drops the last one.
+/// reference and is destroyed, through its virtual destructor, on the thread that releases the last one.
 class TARVEL_API Object {
 public:
   Object(const Object &) = delete;
@@ -92,7 +92,7 @@ public:
   /// Releases the object; the reference becomes null.
   void reset() noexcept { *this = Ref(); }
 
-  /// Gives up the reference without releasing it: the caller owns one count from then on.
+  /// Returns the object and becomes null, without releasing the object: the caller then owns one count.
   [[nodiscard]] T *Detach() noexcept { return std::exchange(m_object, nullptr); }
 
   /// Whether both refer to the same object.

@@ -17,9 +17,10 @@
 
 namespace Tarvel::Crypto {
 
-/// A certificate, a key or a file that contains them is not valid; the message says what is wrong and where, and includes
-/// OpenSSL's own text. Every function that uses OpenSSL may also throw two exceptions that say nothing about its input:
-/// `InvalidStateException` when OpenSSL has cleaned itself up because the process is ending, and `OutOfMemoryException`.
+/// A certificate or a key, or a file that contains them, is not valid; the message says what is wrong and where, and
+/// includes OpenSSL's own text. Every function that uses OpenSSL may also throw two exceptions that say nothing about
+/// its input: `InvalidStateException` when OpenSSL has cleaned itself up because the process is ending, and
+/// `OutOfMemoryException`.
 class TARVEL_API CryptoException : public Exception {
   TARVEL_EXCEPTION_BODY(CryptoException, Exception);
 };

@@ -24,7 +24,7 @@ class TARVEL_API NoKeyException : public CryptoException {
   TARVEL_EXCEPTION_BODY(NoKeyException, CryptoException);
 };
 
-/// A private key that does not belong to the certificate it was given with.
+/// A private key that does not belong to the certificate with which it is used.
 class TARVEL_API KeyMismatchException : public CryptoException {
   TARVEL_EXCEPTION_BODY(KeyMismatchException, CryptoException);
 };

@@ -15,7 +15,8 @@ namespace Tarvel::Crypto {
 /// TLS then offers what both the machine and this library allow: the machine may set a higher minimum version, a higher
 /// security level or a shorter list of cipher suites; TLS 1.2, level 2 and forward secrecy remain required.
 ///
-/// Call this before the first certificate, key, signature, token or TLS context. Any number of times, on any thread.
+/// Call this before the first certificate, key, signature, token or TLS context. It may be called any number of times,
+/// on any thread.
 /// @throws InvalidStateException when it is called too late, or when OpenSSL has cleaned itself up.
 /// @throws CryptoException when OpenSSL refuses the configuration. By default OpenSSL skips what it cannot load;
 ///         `config_diagnostics = 1` in the file makes it strict.

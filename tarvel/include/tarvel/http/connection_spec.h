@@ -18,9 +18,9 @@ namespace Tarvel::Http {
 /// Opens connections to one endpoint. Immutable; safe on any thread.
 class TARVEL_API ConnectionSpec : public Object {
 public:
-  /// Called exactly once for each start that has not thrown, on an I/O thread, with the stream and null, or with an
-  /// exception, which is valid during the call; there may be a stream then too. It must not block, nor wait for another
-  /// operation: start the next one from it.
+  /// Called exactly once for each start that has not thrown, on an I/O thread: with the stream and null, or with an
+  /// exception and perhaps a stream. The exception is valid during the call. The function must not block, nor wait for
+  /// another operation: start the next one from it.
   using ConnectCompletion = std::function<void(const Ref<System::Stream> &, const Exception *)>;
 
   /// One line for logs. The platform does not read it.
@@ -40,7 +40,7 @@ public:
   /// reported to the completion: usually as a `System::NetworkException`, such as an `Ssl::SSLException`; as an
   /// `OutOfMemoryException` when memory ran out; as an `InvalidStateException` with the text of a foreign exception.
   /// @throws InvalidStateException when there is no I/O thread that could call the completion, and none can be started;
-  ///         `std::bad_alloc`. The completion is not called then.
+  ///         `std::bad_alloc`. In both cases the completion is not called.
   virtual Ref<System::ScheduledItem> AsyncConnect(ConnectCompletion completion) const = 0;
 
 protected:

@@ -34,12 +34,12 @@ protected:
 };
 
 /// Makes an empty store. May be called on any thread.
-/// @param name must be empty: the store is shared with no other. Stores with a name do not exist.
-/// @param out the store; left alone when an exception is thrown.
+/// @param name must be empty: named stores do not exist.
+/// @param out the store; unchanged when an exception is thrown.
 /// @throws InvalidArgumentException when `name` is not empty.
 TARVEL_API void CreateCookieStore(const std::string &name, Ref<CookieStore> &out);
 
-/// Returns an empty store, which is shared with no other. May be called on any thread.
+/// Returns a new, empty store. May be called on any thread.
 inline Ref<CookieStore> CreateCookieStore() {
   Ref<CookieStore> store;
   CreateCookieStore(std::string(), store);

@@ -21,12 +21,12 @@ class TARVEL_API MalformedURLException : public Exception {
 /// Splits a URL (RFC 3986) into its parts.
 /// @param isSecure true for https.
 /// @param host as given, but an IPv6 address without its brackets.
-/// @param port the given port; without one 80, or 443 for https.
+/// @param port the port in the URL; if it has none, 80, or 443 for https.
 /// @param path path and query as sent in the request line, escapes kept; "/" when the URL has neither. A fragment is
 ///        dropped.
 /// @throws MalformedURLException for a scheme other than http and https; a missing host; a host that is not ASCII, or
 ///         is neither a name, nor a complete IPv4 address, nor an IPv6 address without a zone; a port outside 1 to
-///         65535; user information; characters that are not allowed in a URL. The outputs are left alone then.
+///         65535; user information; characters that are not allowed in a URL. The outputs are then unchanged.
 TARVEL_API void ParseHttpURL(std::string_view url, bool &isSecure, std::string &host, int &port, std::string &path);
 
 } // namespace Tarvel::Http

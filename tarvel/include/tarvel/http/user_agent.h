@@ -23,15 +23,15 @@ namespace Tarvel::Http {
 constexpr std::size_t MAX_HEADER_BYTES = 64u * 1024;      ///< of each response, interim ones too; status line included
 constexpr std::size_t MAX_BODY_BYTES = 16u * 1024 * 1024; ///< of a response
 
-/// A response that is not HTTP/1.x by RFC 9112, that contradicts itself, ends early or is over a limit.
+/// A response that is not HTTP/1.x by RFC 9112, contradicts itself, ends early or exceeds a limit.
 class TARVEL_API HttpException : public Exception {
   TARVEL_EXCEPTION_BODY(HttpException, Exception);
 };
 
-/// A request to be sent, once. Used by one thread at a time. Its body is wiped when it is destroyed.
+/// A request, which can be sent once. Used by one thread at a time. Its body is wiped when the request is destroyed.
 class TARVEL_API ClientRequest : public Object {
 public:
-  /// Sets a header, in place of an earlier one of the same name.
+  /// Sets a header; an earlier one of the same name is replaced.
   /// @throws InvalidArgumentException when name or value is not allowed in a header (line ends, control characters), or
   ///         the user agent itself sets that header: Host, Connection, Content-Length, Transfer-Encoding, Expect, Cookie
   ///         and Accept-Encoding.
@@ -43,14 +43,14 @@ protected:
   ~ClientRequest() override;
 };
 
-/// A whole response. As a reader it gives the body, which is wiped when the response is destroyed; the caller wipes
-/// what `ReadToEnd` returns. With a status other than 2xx and 500, only the header was read: the body is empty, and
-/// when the header states the body's length or coding in a wrong way, the headers from that one on are missing.
+/// A whole response. It is a reader of the body, which is wiped when the response is destroyed; the caller wipes what
+/// `ReadToEnd` returns. With a status other than 2xx and 500, only the header was read: the body is empty, and if a
+/// header states the body's length or coding in a wrong way, that header and the ones after it are missing.
 ///
 /// The body is returned as it was received, with one exception: a body that the charset of its media type declares as
 /// ISO-8859-1, under any of the names that IANA lists, is returned as UTF-8, unless it is valid UTF-8 and not ASCII
-/// already. An XML declaration in it that says ISO-8859-1 then says UTF-8. Such a body is at most twice as long as the
-/// received one.
+/// already. If its XML declaration says ISO-8859-1, that is changed to UTF-8. Such a body is at most twice as long as
+/// the received one.
 class TARVEL_API ClientResponse : public Reader {
 public:
   /// The status code of the status line, for example 200.
@@ -70,8 +70,8 @@ protected:
   ~PendingRequestItem() override;
 };
 
-/// Connections kept for later requests. Pools are not offered yet: a user agent is created with a null pool and opens
-/// one connection for each request.
+/// Connections kept for later requests. There are no pools yet: a user agent is created with a null pool and opens one
+/// connection for each request.
 class TARVEL_API ConnectionPool : public Object {
 protected:
   ~ConnectionPool() override;
@@ -85,22 +85,23 @@ public:
   /// Called exactly once for each start, on an I/O thread: with null and the whole response, or with an exception and
   /// null. When memory runs out, the exception is an `OutOfMemoryException`. When another library, a stream, a
   /// connection specification or a cookie store throws something that is not a `Tarvel::Exception`, it is an
-  /// `InvalidStateException` with that text. The exception is valid during the call. The item is the one that
-  /// `StartRequest` returns. An exception that leaves the function is logged and goes no further. The function must not
-  /// block, nor wait for another request: there are only two such threads, and that request completes on one of them.
-  /// Start the next request from here, and queue work that takes time on a thread pool. The function is never called in
-  /// a child that `fork` has made after the start.
+  /// `InvalidStateException` with the text of what was thrown. The exception is valid during the call. The item is the
+  /// one that `StartRequest` returns. An exception that the function throws is logged and has no other effect. The
+  /// function must not block, nor wait for another request: there are only two I/O threads, and that request completes
+  /// on one of them. Start the next request from here, and queue work that takes time on a thread pool. The function is
+  /// never called in a child that `fork` has made after the start.
   using CompletionFunction =
       std::function<void(const Exception *, const Ref<ClientResponse> &, const Ref<PendingRequestItem> &)>;
 
-  /// Connects, sends and reads the response, without blocking. There is no time-out; a caller that does not call
-  /// `WaitForRequest` cancels the item. Redirects are not followed. At most 16 interim responses (1xx but 101) are
-  /// skipped; one more is an HttpException. A status other than 2xx and 500 is reported as soon as its header has
-  /// arrived. Content is not decoded: no coding is asked for, and with 2xx and 500 content that has one is a failure.
-  /// Bytes after the response are ignored. The request's body is wiped after it is sent.
+  /// Connects, sends and reads the response, without blocking. There is no time-out: a caller that does not call
+  /// `WaitForRequest` must cancel the item itself when the request takes too long. Redirects are not followed. At most
+  /// 16 interim responses (1xx except 101) are skipped; one more is an HttpException. A status other than 2xx and 500 is
+  /// reported as soon as its header has arrived. Content is not decoded: the request accepts no coding, and a 2xx or
+  /// 500 response whose content has one is a failure. Bytes after the response are ignored. The request's body is wiped
+  /// after it is sent.
   /// @throws InvalidArgumentException for a request that `CreateHttpRequest` did not make, InvalidStateException for one
-  ///         that has been started, and any exception of the connection specification; the completion function is not
-  ///         called then.
+  ///         that has been started, and any exception of the connection specification. In these cases the completion
+  ///         function is not called.
   virtual void StartRequest(const Ref<ClientRequest> &request, CompletionFunction completion,
                             Ref<PendingRequestItem> &pending) = 0;
 
@@ -119,12 +120,12 @@ protected:
 
 /// Makes a user agent, which keeps a reference to `spec` and to `cookies`. May be called on any thread.
 /// @param pool must be null.
-/// @param out the user agent; left alone when an exception is thrown.
+/// @param out the user agent; unchanged when an exception is thrown.
 /// @throws InvalidArgumentException when `pool` is not null, or one of the others is null.
 TARVEL_API void CreateHttpUserAgent(const Ref<ConnectionSpec> &spec, const Ref<CookieStore> &cookies,
                                     const Ref<ConnectionPool> &pool, Ref<UserAgent> &out);
 
-/// Returns what the form above would set, with no connection pool.
+/// Returns the user agent that the form above makes without a connection pool.
 /// @throws InvalidArgumentException when `spec` or `cookies` is null.
 inline Ref<UserAgent> CreateHttpUserAgent(const Ref<ConnectionSpec> &spec, const Ref<CookieStore> &cookies) {
   Ref<UserAgent> userAgent;
@@ -134,11 +135,11 @@ inline Ref<UserAgent> CreateHttpUserAgent(const Ref<ConnectionSpec> &spec, const
 
 /// Makes a request without headers and body. May be called on any thread.
 /// @param method for example "POST". @param path path and query, beginning with "/".
-/// @param out the request; left alone when an exception is thrown.
+/// @param out the request; unchanged when an exception is thrown.
 /// @throws InvalidArgumentException when `method` or `path` is not allowed in a request line.
 TARVEL_API void CreateHttpRequest(std::string_view method, std::string_view path, Ref<ClientRequest> &out);
 
-/// Returns what the form above would set. @throws InvalidArgumentException as above.
+/// Returns the request that the form above makes. @throws InvalidArgumentException as above.
 inline Ref<ClientRequest> CreateHttpRequest(std::string_view method, std::string_view path) {
   Ref<ClientRequest> request;
   CreateHttpRequest(method, path, request);

@@ -20,8 +20,7 @@ public:
   virtual std::size_t Read(char *buffer, std::size_t length) = 0;
 
   /// Everything from the current position to the end.
-  /// @param maximumBytes reading stops as soon as it has read more than this; the result is then at least one byte
-  ///        longer.
+  /// @param maximumBytes a reader may stop when it has read more than this; the result is then longer than this.
   /// @throws IOException when the source fails.
   virtual std::string ReadToEnd(std::size_t maximumBytes);
 

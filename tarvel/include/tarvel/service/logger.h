@@ -22,8 +22,8 @@ struct LogRecord {
   std::string_view message; ///< the text of the line
 };
 
-/// The host's function for one line. Called on the thread that logs, possibly on several at once; an exception that
-/// leaves it is ignored.
+/// The host's function for one line. Called on the thread that logs, possibly on several at once; an exception that it
+/// throws is ignored.
 using LogSink = std::function<void(const LogRecord &)>;
 
 /// The root of all loggers, which has the host's sink. There is one, in the `App`.
@@ -33,7 +33,7 @@ public:
   /// writing at that moment may still reach the earlier sink.
   virtual void SetSink(LogSink sink) = 0;
 
-  /// Hands `record` to the sink, if there is one. Never throws.
+  /// Passes `record` to the sink, if there is one. Never throws.
   virtual void Write(const LogRecord &record) noexcept = 0;
 
   /// Whether a sink is installed.
@@ -54,7 +54,7 @@ public:
 
   /// The highest level that is written; one atomic load. A line of level n is written when this is at least n.
   int GetLevel() const noexcept { return m_level.load(std::memory_order_relaxed); }
-  /// Sets it; other threads see the change soon.
+  /// Sets the highest level that is written; other threads see the change soon.
   void SetLevel(int level) noexcept { m_level.store(level, std::memory_order_relaxed); }
 
   /// Writes one line, whatever its level; callers test `GetLevel` first. Never throws.

@@ -16,8 +16,8 @@
 
 namespace Tarvel::Ssl {
 
-/// A failed handshake or a broken TLS connection. The message contains the host and the reason as the TLS library words
-/// it.
+/// A failed handshake or a broken TLS connection. The message contains the host, and the reason in the words of the TLS
+/// library.
 class TARVEL_API SSLException : public System::NetworkException {
   TARVEL_EXCEPTION_BODY(SSLException, System::NetworkException);
 };
@@ -25,10 +25,10 @@ class TARVEL_API SSLException : public System::NetworkException {
 /// A TLS layer over a connected stream.
 class TARVEL_API SSLStream : public System::Stream {
 public:
-  /// Called once, on an I/O thread, with null or with what went wrong, which is valid during the call: an
-  /// `SSLException`, also when the stream below failed; an `InvalidStateException` for a second handshake, and when OpenSSL has
-  /// cleaned itself up because the process ends; an `OutOfMemoryException`, which says nothing about the server. Like
-  /// every completion of a stream, it must not block, nor wait for another operation: start the next one from it.
+  /// Called once, on an I/O thread, with null or with the failure, which is valid during the call: an `SSLException`,
+  /// also when the stream below failed; an `InvalidStateException` for a second handshake, and when OpenSSL has cleaned
+  /// itself up because the process ends; an `OutOfMemoryException`, which says nothing about the server. Like every
+  /// completion of a stream, it must not block, nor wait for another operation: start the next one from it.
   using HandshakeHandler = std::function<void(const Exception *)>;
 
   /// Starts the client handshake. `host` is sent as the server name (unless it is an address). The server's certificate
@@ -49,9 +49,9 @@ protected:
 
 /// Settings and remembered sessions for TLS connections: TLS 1.2 or later, only cipher suites with forward secrecy,
 /// keys of at least 112 bits of security, peer and host name always verified. No configuration of OpenSSL changes that,
-/// and `Crypto::UseSystemConfiguration` can only narrow it. Set it up on one thread, then use it on any thread; do not
-/// change it while it is in use. A child process made by `fork` may use the contexts of its parent, but has none of
-/// their sessions.
+/// and `Crypto::UseSystemConfiguration` can only make it stricter. Set a context up on one thread, then use it on any
+/// thread; do not change it while it is in use. A child process made by `fork` may use the contexts of its parent, but
+/// has none of their sessions.
 ///
 /// Each function also throws `InvalidStateException` when OpenSSL has cleaned itself up, and `OutOfMemoryException`.
 class TARVEL_API SSLContext : public Object {
@@ -64,7 +64,7 @@ public:
   /// @throws Crypto::CryptoException
   virtual void TrustCertificates(const Crypto::CertificateList &certificates) = 0;
 
-  /// Sets the certificate to present when the server asks for one, its key, and the certificates between it and the
+  /// Sets the certificate to present when the server requests one, its key, and the certificates between it and the
   /// root.
   /// @throws Crypto::KeyMismatchException, Crypto::CryptoException
   virtual void SetClientCertificate(const Ref<const Crypto::Certificate> &certificate,

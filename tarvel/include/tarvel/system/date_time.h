@@ -16,7 +16,7 @@ namespace Tarvel::System {
 /// The number of microseconds in a second.
 constexpr std::int64_t MICROSECONDS_PER_SECOND = 1'000'000;
 
-/// `seconds` in microseconds, or the nearest `std::int64_t` to that: an absurd number means "always" or "never", and
+/// `seconds` in microseconds, or the nearest `std::int64_t`: an absurdly large number means "always" or "never", and
 /// does not wrap around into its opposite.
 TARVEL_API std::int64_t SecondsToMicroseconds(std::int64_t seconds) noexcept;
 
@@ -36,12 +36,12 @@ public:
   explicit DateTime(std::string_view text);
 
   /// `time`, shown in UTC: rounded down to a microsecond, and outside the years 1 to 9999 the nearest point inside.
-  /// `Duration` is any `std::chrono::duration`; of a floating-point one, "not a number" is the start of year 1.
+  /// `Duration` is any `std::chrono::duration`; a floating-point "not a number" becomes the start of year 1.
   template <typename Duration>
   static DateTime FromTimePoint(std::chrono::time_point<std::chrono::system_clock, Duration> time);
 
-  /// The same point in time for `std::chrono`. `std::chrono::system_clock::time_point` may be unable to hold it: with
-  /// nanoseconds in 64 bits it ends in the year 2262. Compare in microseconds.
+  /// The same point in time for `std::chrono`. Compare it in microseconds: `std::chrono::system_clock::time_point` may
+  /// be unable to represent it, because nanoseconds in 64 bits end in the year 2262.
   constexpr std::chrono::time_point<std::chrono::system_clock, std::chrono::microseconds> ToTimePoint() const noexcept {
     return std::chrono::time_point<std::chrono::system_clock, std::chrono::microseconds>(
         std::chrono::microseconds(m_utcMicroseconds));
@@ -55,8 +55,8 @@ public:
     return m_utcMicroseconds - other.m_utcMicroseconds;
   }
 
-  /// The point so much later, or earlier for a negative number; outside the years 1 to 9999 the nearest point inside
-  /// (it saturates). The bias stays, except where a field would leave these years: there it is 0.
+  /// The point that is this much later, or earlier for a negative number; outside the years 1 to 9999 the nearest point
+  /// inside (it saturates). The bias is kept, except where a field would leave these years: there it becomes 0.
   DateTime PlusMicroseconds(std::int64_t microseconds) const noexcept;
   DateTime PlusSeconds(std::int64_t seconds) const noexcept;
 
@@ -73,7 +73,7 @@ public:
   int GetMillisecond() const noexcept;                          ///< 0 to 999
   int GetBiasMinutes() const noexcept { return m_biasMinutes; } ///< minutes east of UTC in which the fields are shown
 
-  /// "Z" for a zero bias, else the offset as "+hh:mm" or "-hh:mm".
+  /// "Z" for a zero bias, otherwise the offset as "+hh:mm" or "-hh:mm".
   std::string ToShortStringBias() const;
 
   /// The platform's own text form: xsd:dateTime with three fraction digits and the zone, such as
@@ -109,7 +109,7 @@ TARVEL_API std::string FormatMessageArgument(const DateTime &value);
 template <typename Duration>
 DateTime DateTime::FromTimePoint(std::chrono::time_point<std::chrono::system_clock, Duration> time) {
   using std::chrono::microseconds;
-  // Beyond every date on either side, and yet far from where the exact conversion would overflow.
+  // Beyond every date in both directions, but far below the values at which the exact conversion would overflow.
   constexpr long double FAR_AWAY = 4e17L;
   const long double roughly = std::chrono::duration<long double, std::micro>(time.time_since_epoch()).count();
   if (roughly > -FAR_AWAY && roughly < FAR_AWAY) {

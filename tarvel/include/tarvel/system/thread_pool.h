@@ -15,15 +15,15 @@
 namespace Tarvel::System {
 
 /// Runs queued functions on threads of its own. Threads are made on demand up to a ceiling and end when they have been
-/// idle for a while. The queue is bounded by memory alone. Network completions never run here, so work that waits for
-/// the network cannot block its own completion, whatever the ceiling. Safe on any thread.
+/// idle for a while. Only memory bounds the queue. Network completions never run here, so work that waits for the
+/// network cannot block its own completion, however low the ceiling is. Safe on any thread.
 ///
 /// A child process made by `fork` may use the pools of its parent; they start threads there. Work that the parent has
 /// queued never runs in the child, and counts as done.
 class TARVEL_API ThreadPool : public Object {
 public:
   /// Queues `work` for one run and returns at once. Items start in the order in which they are queued. An exception
-  /// that leaves `work` is logged (logger "Tarvel", level 8) and ends that item only. `work` and what it captures
+  /// that `work` throws is logged (logger "Tarvel", level 8) and ends that item only. `work` and what it captures
   /// are destroyed on the pool's thread after the run, or on the thread that removes a cancelled item from the queue.
   ///
   /// `work` must not wait for another item of the pool: when as many items wait as the pool may have threads, the items
@@ -48,9 +48,9 @@ constexpr std::size_t DEFAULT_THREAD_CEILING = 256;
 /// The process's pool, made on first use (no thread before the first item); it lives until the process ends.
 TARVEL_API Ref<ThreadPool> GetThreadPool();
 
-/// A separate pool; its ceiling is at least one thread. Releasing the last reference ends it: work in the queue is
-/// dropped, and running work is waited for (unless the reference is released by the pool's own work, which is then left
-/// to finish).
+/// A separate pool; its ceiling is at least one thread. Releasing the last reference ends the pool: it drops the work
+/// in the queue and waits for running work. If work of the pool itself releases the last reference, running work is not
+/// waited for, and ends by itself.
 TARVEL_API Ref<ThreadPool> CreateThreadPool(std::size_t threadCeiling,
                                             std::chrono::milliseconds idleTime = std::chrono::seconds(10));
 

@@ -2,11 +2,12 @@
 /// @file
 /// The nodes of an XML tree.
 ///
-/// The nodes of one parsed document, or one node made alone, live in one arena, which is kept alive by the `Document` and by
-/// every `Ref` to any of its nodes. Appending a node to another tree joins the two arenas for good: each `Ref` to a node of
-/// either then keeps both alive. A plain pointer to a node is valid while one of these keeps the arena alive. A tree may be
-/// read from any number of threads. It may be changed from one thread while no other thread uses it, or copies or releases a
-/// `Ref` to it. Texts are UTF-8; a view of a text in a tree is valid as long as the tree.
+/// The nodes of a parsed document share one arena of memory, and a node that a factory makes has its own. The
+/// `Document`, and every `Ref` to any of the nodes, keep the arena alive. Appending a node to another tree joins the
+/// two arenas permanently: each `Ref` to a node of either then keeps both alive. A plain pointer to a node is valid as
+/// long as its arena. A tree may be read from any number of threads. It may be changed from one thread while no other
+/// thread uses it, or copies or releases a `Ref` to it. Texts are UTF-8; a view of a text in a tree is valid as long as
+/// the tree.
 
 #pragma once
 
@@ -180,9 +181,9 @@ public:
   std::uint32_t GetLine() const noexcept { return m_line; }
   std::uint32_t GetColumn() const noexcept { return m_column; }
 
-  /// The namespace bound to `prefix` (empty: the default namespace) by the declarations in scope here, looked up afresh at
-  /// each call. "xml" and "xmlns" are always bound. Without a declaration, the default namespace counts as bound to the
-  /// empty text. A declaration with an empty value unbinds its prefix.
+  /// The namespace bound to `prefix` (empty: the default namespace) by the declarations in scope here. Each call
+  /// searches again. "xml" and "xmlns" are always bound. Without a declaration, the default namespace counts as bound
+  /// to the empty text. A declaration with an empty value unbinds its prefix.
   /// @return whether the prefix is bound; `uri` is written only then.
   bool LookupNamespace(std::string_view prefix, std::string_view &uri) const noexcept;
 
@@ -246,7 +247,7 @@ private:
     Attribute **nextDeclaration;
   };
 
-  // The views passed to both must live as long as the arena.
+  // The views passed to both functions must be valid as long as the arena.
   void SetName(std::string_view name) noexcept;
   void AppendAttribute(AttributeEnd &end, std::string_view name, std::size_t prefixLength, std::string_view value);
 

@@ -41,7 +41,7 @@ private:
 constexpr std::size_t MAX_DOCUMENT_BYTES = 16u * 1024 * 1024; ///< a longer document is refused
 constexpr unsigned MAX_ELEMENT_DEPTH = 256;                   ///< the document element has depth 1
 constexpr unsigned MAX_ATTRIBUTES = 256;                      ///< of one element, namespace declarations included
-constexpr unsigned MAX_NAMESPACES_IN_SCOPE = 256;             ///< declarations in force at one element
+constexpr unsigned MAX_NAMESPACES_IN_SCOPE = 256;             ///< declarations in scope at one element
 constexpr std::size_t MAX_NODES = 1024 * 1024;                ///< of one document: nodes and attributes
 constexpr std::size_t MAX_NAME_BYTES = 4096;                  ///< of an element, attribute or target, prefix included
 
@@ -53,8 +53,8 @@ class TARVEL_API XMLParser : public Object {
 public:
   /// Reads `reader` to its end and returns what the handler made of the document.
   /// @throws XMLParseException when the document is refused; the handler then has no result.
-  /// @throws IOException when the reader fails. @throws std::bad_alloc when memory runs out, which is no verdict on the
-  ///         document.
+  /// @throws IOException when the reader fails. @throws std::bad_alloc when memory runs out, which says nothing about
+  ///         the document.
   virtual Ref<Object> Parse(Reader &reader) = 0;
 
 protected:

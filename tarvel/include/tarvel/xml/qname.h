@@ -32,7 +32,7 @@ struct QName {
     return std::tie(a.namespaceUri, a.localName) < std::tie(b.namespaceUri, b.localName);
   }
 
-  /// "{namespace}local", or "local" alone for a name in no namespace.
+  /// "{namespace}local", or only "local" for a name in no namespace.
   TARVEL_API std::string ToString() const;
 };
 

@@ -36,8 +36,8 @@ protected:
   ~Canonicalizer() override;
 };
 
-/// The canonicalizer for an algorithm URI: one of `CanonicalizationUri`, or the inclusive URI with a lone "#" appended, which
-/// means the same algorithm.
+/// The canonicalizer for an algorithm URI: one of `CanonicalizationUri`, or the inclusive URI with only "#" appended,
+/// which means the same algorithm.
 /// @param inclusivePrefixes for the exclusive algorithms, the InclusiveNamespaces PrefixList ("#default" is the default
 ///        namespace); must be empty for the inclusive ones.
 /// @throws XmlSecurityException for any other algorithm; the message contains the URI.

@@ -13,7 +13,7 @@
 
 namespace Tarvel::Xml::Security {
 
-/// Supplies the certificates whose keys a signature may have been made with. Immutable; safe on any thread.
+/// Returns the certificates with whose keys a signature is checked. Immutable; safe on any thread.
 class TARVEL_API KeyInfoResolver : public Object {
 public:
   /// The candidates, in order.

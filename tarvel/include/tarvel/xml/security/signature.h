@@ -36,8 +36,8 @@ constexpr std::string_view ENVELOPED_SIGNATURE = "http://www.w3.org/2000/09/xmld
 constexpr std::string_view NAMESPACE = "http://www.w3.org/2000/09/xmldsig#";
 } // namespace SignatureUri
 
-/// One `ds:Signature`: read from a tree, for verification, or blank, for signing. Verification may run on several threads at
-/// once; `AddReference`, `SetKeyInfo` and `Sign` are for one thread.
+/// One `ds:Signature`: either read from a tree, for verification, or blank, for signing. Verification may run on
+/// several threads at once; `AddReference`, `SetKeyInfo` and `Sign` are for one thread.
 class TARVEL_API Signature : public Object {
 public:
   /// One `ds:Reference`.
@@ -59,23 +59,23 @@ public:
 
   /// Adds a reference to be signed, with one transform.
   /// @throws XmlSecurityException for a transform other than exclusive canonicalisation without comments, or a digest other
-  ///         than SHA-256/384/512. @throws InvalidStateException after `Sign`, and for a signature taken from a tree.
+  ///         than SHA-256/384/512. @throws InvalidStateException after `Sign`, and for a signature read from a tree.
   virtual void AddReference(std::string_view uri, std::string_view digestUri, std::string_view transformUri) = 0;
 
   /// Makes `content` the only child of the signature's `ds:KeyInfo`, when `Sign` is called.
-  /// @throws InvalidStateException after `Sign`, and for a signature taken from a tree.
+  /// @throws InvalidStateException after `Sign`, and for a signature read from a tree.
   virtual void SetKeyInfo(const Ref<ElementNode> &content) = 0;
 
   /// Computes the digests of the tree in its present state, and the signature value. The caller then inserts the signature
   /// element into the tree, where it must not change the exclusive canonical form of `SignedInfo`.
   /// @throws OutOfMemoryException, and InvalidStateException when OpenSSL has cleaned itself up.
   /// @throws XmlSecurityException when there is no reference, one does not resolve, or the key cannot sign with the
-  ///         algorithm; the signature then stays blank. @throws InvalidStateException after `Sign`, for a key info content
-  ///         that has a parent, and for a signature taken from a tree.
+  ///         algorithm; the signature then stays blank. @throws InvalidStateException after `Sign`, for a `SetKeyInfo`
+  ///         content that has a parent, and for a signature read from a tree.
   virtual void Sign(const Crypto::PrivateKey &key) = 0;
 
   /// The `ds:Signature` element that `Sign` made.
-  /// @throws InvalidStateException before `Sign`, and for a signature taken from a tree.
+  /// @throws InvalidStateException before `Sign`, and for a signature read from a tree.
   virtual Ref<ElementNode> GetElement() const = 0;
 
 protected:
@@ -88,11 +88,11 @@ protected:
 ///
 /// This checks only the syntax, so that `GetReferences` can report what a signature claims to cover before anything is
 /// computed. The syntax is: elements of the ds namespace in the order of XML Signature, only the attributes that it defines,
-/// an `Algorithm` wherever one belongs, a `URI` on each reference (a missing one could be taken for ""), digest and
+/// an `Algorithm` wherever one belongs, a `URI` on each reference (a missing one could be read as ""), digest and
 /// signature values that are Base64 text and nothing else, only white space and comments between elements. `Verify` refuses
 /// what has this syntax but is outside the profile: an unknown algorithm or parameter, `ds:Object`, a reference's `Type`, no
 /// reference at all or more than ten, more than two transforms or a second one after a canonicalisation, a URI that is
-/// neither "" nor "#" and a bare name.
+/// neither "" nor "#" followed by a name.
 /// @throws SignatureSyntaxException whose message says what is wrong and where.
 TARVEL_API void CreateSignatureFromDom(const ElementNode &root, const ElementNode &signature, Ref<Signature> &out);
 
