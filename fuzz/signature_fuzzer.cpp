@@ -88,7 +88,8 @@ const Node *FindTarget(const Document &document, std::string_view uri) {
 std::set<std::string> CoveredForms(const Document &document, const ElementNode &signature,
                                    const std::set<std::string> &uris) {
   Tarvel::Xml::Security::CanonicalizationMethod method;
-  Require(Tarvel::Xml::Security::FindCanonicalizationMethod(Tarvel::Xml::Security::CanonicalizationUri::EXCLUSIVE, method));
+  Require(
+      Tarvel::Xml::Security::FindCanonicalizationMethod(Tarvel::Xml::Security::CanonicalizationUri::EXCLUSIVE, method));
   std::set<std::string> forms;
   for (const std::string &uri : uris) {
     const Node *const target = FindTarget(document, uri);

@@ -11,6 +11,7 @@
 
 #include <tarvel/core/exception.h>
 #include <tarvel/crypto/certificate.h>
+#include <tarvel/xml/parser.h>
 
 #include <algorithm>
 #include <exception>
@@ -92,8 +93,11 @@ int main(int argc, char **argv) {
     std::cerr << "refused: " << error.what() << '\n'; // changed, or signed with a key that is not trusted
   } catch (const SsoClient::ParseException &error) {
     std::cerr << "refused: " << error.what() << '\n'; // not a token, expired, or not valid yet
+  } catch (const Tarvel::Xml::XMLParseException &error) {
+    std::cerr << "refused: " << error.what() << '\n'; // not well-formed XML
   } catch (const std::exception &error) {
-    std::cerr << "refused: " << error.what() << '\n'; // not well-formed XML, or a signature of another form
+    std::cerr << "failed: " << error.what() << '\n'; // not a verdict: out of memory, or the process is about to end
+    return FAILED;
   }
   return REFUSED; // Say no more than this to the caller: the reason is for your own log.
 }

@@ -60,7 +60,7 @@ class SSOCLIENT_API SecurityTokenService {
 public:
   /// Called once when an asynchronous operation ends, on a thread of the pool, possibly before the call that started the
   /// operation has returned. On success `token` is the token (null as described above) and `failure` is null. On failure
-  /// `token` is null, and `failure` is valid during the call only (`Clone` makes a copy to keep).
+  /// `token` is null, and `failure` is valid during the call only (`Copy` returns one to keep).
   ///
   /// **It is not called at all when the operation ends with an exception that is not a `Tarvel::Exception`**: `std::bad_alloc`,
   /// or a class of a negotiation handler's own. The pool logs such an exception, and also anything that the completion

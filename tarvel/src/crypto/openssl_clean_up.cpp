@@ -11,12 +11,13 @@ namespace Tarvel::Crypto {
 namespace {
 
 // Constant-initialised and never destroyed.
-ForkSafeMutex mutex;               // guards the list
+ForkSafeMutex mutex;                   // guards the list
 OpenSslCleanUpNotice *first = nullptr; // the newest
 
 } // namespace
 
-OpenSslCleanUpNotice::OpenSslCleanUpNotice(Function function, void *owner) noexcept : m_function(function), m_owner(owner) {
+OpenSslCleanUpNotice::OpenSslCleanUpNotice(Function function, void *owner) noexcept
+    : m_function(function), m_owner(owner) {
   const std::lock_guard<ForkSafeMutex> lock(mutex);
   m_next = first;
   if (m_next) {

@@ -281,7 +281,7 @@ TEST_F(RequestBuilderImplTest, SetsTheActionBeforeAndTheBodyAfterItComposesTheEn
   expectOnlyAction(Request::ISSUE, [&](Request &out) { builder.BuildCertificateTokenRequest(Spec(), out); });
   expectOnlyAction(Request::ISSUE, [&](Request &out) { builder.BuildExchangeTokenRequest(HOK_TOKEN, Spec(), out); });
   expectOnlyAction(Request::VALIDATE,
-                    [&](Request &out) { builder.BuildValidateSubjectRequest(UNPARSABLE_BEARER_TOKEN, out); });
+                   [&](Request &out) { builder.BuildValidateSubjectRequest(UNPARSABLE_BEARER_TOKEN, out); });
   expectOnlyAction(Request::RENEW, [&](Request &out) { builder.BuildRenewRequest(HOK_TOKEN, 600, out); });
 }
 

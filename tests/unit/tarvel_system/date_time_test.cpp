@@ -378,6 +378,16 @@ TEST(DateTimeFromTimePoint, ReadsAnyDuration) {
   EXPECT_EQ(DateTime::FromTimePoint(std::chrono::system_clock::time_point()).GetUtcTime(), 0);
 }
 
+TEST(DateTimeFromTimePoint, ReadsLongTimesInFinePeriods) {
+  constexpr std::int64_t YEAR_3000_SECONDS = 32'503'680'000;
+  EXPECT_EQ(TextOf(std::chrono::duration<std::int64_t, std::ratio<1, 4'294'967'296>>(1'700'000'000 * 4'294'967'296)),
+            "2023-11-14T22:13:20.000Z");
+  EXPECT_EQ(TextOf(std::chrono::duration<std::int64_t, std::ratio<1, 44'100>>(YEAR_3000_SECONDS * 44'100 + 22'050)),
+            "3000-01-01T00:00:00.500Z");
+  EXPECT_EQ(TextOf(std::chrono::duration<float>(1e9F)), "2001-09-09T01:46:40.000Z");
+  EXPECT_EQ(MicrosecondsOf(std::chrono::duration<std::int64_t, std::pico>::min()), -9'223'372'036'855);
+}
+
 TEST(DateTimeFromTimePoint, RoundsDownToAMicrosecond) {
   using std::chrono::nanoseconds;
   EXPECT_EQ(MicrosecondsOf(nanoseconds(999)), 0);

@@ -113,7 +113,12 @@ DateTime DateTime::FromTimePoint(std::chrono::time_point<std::chrono::system_clo
   constexpr long double FAR_AWAY = 4e17L;
   const long double roughly = std::chrono::duration<long double, std::micro>(time.time_since_epoch()).count();
   if (roughly > -FAR_AWAY && roughly < FAR_AWAY) {
-    return DateTimeFromUtc(std::chrono::floor<microseconds>(time.time_since_epoch()).count(), false);
+    // In two parts, because the product of a long time and a fine period would overflow. Not by `floor`, which compares in that
+    // period.
+    const auto sinceEpoch = time.time_since_epoch();
+    const auto whole = std::chrono::duration_cast<std::chrono::seconds>(sinceEpoch);
+    return DateTimeFromUtc(microseconds(whole).count() + std::chrono::floor<microseconds>(sinceEpoch - whole).count(),
+                           false);
   }
   return DateTimeFromUtc(roughly > 0 ? microseconds::max().count() : microseconds::min().count(), false);
 }

@@ -22,8 +22,8 @@ struct SignatureAlgorithm {
 
 /// How the digest of a reference is computed from its target.
 struct ReferencePlan {
-  bool omitsSignature = false; ///< the enveloped-signature transform
-  CanonicalizationMethod method;      ///< never with comments: same-document references leave them out
+  bool omitsSignature = false;   ///< the enveloped-signature transform
+  CanonicalizationMethod method; ///< never with comments: same-document references leave them out
   Crypto::DigestAlgorithm digest = Crypto::DigestAlgorithm::SHA256;
 };
 

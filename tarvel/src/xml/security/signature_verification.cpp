@@ -25,7 +25,8 @@ bool CanVerify(const Crypto::Certificate &certificate, Crypto::SignatureScheme s
   unsigned bits = 0;
   switch (Crypto::GetKeyKind(certificate, bits)) {
   case Crypto::KeyKind::RSA:
-    return scheme != Crypto::SignatureScheme::ECDSA && bits >= MIN_RSA_BITS && Crypto::HasAcceptableExponent(certificate);
+    return scheme != Crypto::SignatureScheme::ECDSA && bits >= MIN_RSA_BITS &&
+           Crypto::HasAcceptableExponent(certificate);
   case Crypto::KeyKind::EC_P256:
   case Crypto::KeyKind::EC_P384:
   case Crypto::KeyKind::EC_P521:
