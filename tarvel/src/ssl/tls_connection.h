@@ -96,6 +96,7 @@ public:
 
 private:
   /// Called by OpenSSL for each message and each record's header; for outgoing records, before they are sent.
+  /// Notes a lack of memory.
   static void OnMessage(int, int, int, const void *, std::size_t, SSL *, void *connection) noexcept;
 
   ConnectionHandle MakeConnection(const ServerIdentity &identity, BIO *&received, BIO *&toSend);
