@@ -129,7 +129,7 @@ std::shared_ptr<const SsoClient::SamlToken> Acquire(const char *url, const char 
   SsoClient::SecurityTokenServiceConfig config;
   config.stsUrl = url;
   config.signingCertificates = Tarvel::Crypto::LoadCertificates(signers);
-  config.sslContext = tls.get(); // the context takes its own reference
+  config.sslContext = tls.get(); // the negotiation takes its own reference
   SsoClient::TokenSpec spec;
   spec.tokenLifetimeSec = 8 * 60 * 60;
 

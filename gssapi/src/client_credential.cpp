@@ -76,7 +76,7 @@ ClientCredential::ClientCredential(const SpnegoSettings &settings) {
     ImportName(settings.client, GSS_KRB5_NT_PRINCIPAL_NAME, client);
   }
 
-  // The credential for Kerberos is acquired first, since SPNEGO does not say why it finds none.
+  // The credential for Kerberos is acquired first, because SPNEGO does not report why it finds none.
   CredentialHandle kerberos;
   OM_uint32 lifetime = 0;
   RequireSuccess(Acquire(client.Get(), KerberosMechanism(), store, kerberos, lifetime), KerberosMechanism(), settings);

@@ -22,7 +22,7 @@ public:
 
   Object Get() const noexcept { return m_object; }
 
-  /// For a function that replaces the object, or that stores one in an empty handle.
+  /// The place where a function replaces the object, or stores one if the handle is empty.
   Object *Slot() noexcept { return &m_object; }
 
   void Reset() noexcept {
@@ -66,7 +66,7 @@ public:
     gss_release_buffer(&minor, &m_buffer);
   }
 
-  /// For a function that allocates octets. The handle must be empty.
+  /// The place where a function stores octets that it allocates. It must be empty.
   gss_buffer_t Slot() noexcept { return &m_buffer; }
 
   const std::uint8_t *begin() const noexcept { return static_cast<const std::uint8_t *>(m_buffer.value); }

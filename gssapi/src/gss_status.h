@@ -17,7 +17,7 @@ struct GssStatus {
   bool IsError() const noexcept { return GSS_ERROR(major) != 0; }
 };
 
-/// Everything that the GSSAPI says about a failure: the texts of the major status, ": ", and the texts of the minor
+/// Everything that the GSSAPI reports about a failure: the texts of the major status, ": ", and the texts of the minor
 /// status, which is the mechanism's. Several texts of one status are separated by "; ". Call it right after the
 /// failure: the texts of a minor status may be those of this thread's last failure.
 std::string DescribeStatus(const GssStatus &status, gss_OID mechanism);

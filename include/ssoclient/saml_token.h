@@ -24,7 +24,7 @@ namespace SsoClient {
 /// be deleted. What is returned by reference or pointer belongs to the token and is valid as long as the token.
 class SSOCLIENT_API SamlToken {
 public:
-  /// How the sender of the token proves to be its subject.
+  /// How the sender of the token proves that it is the subject.
   enum ConfirmationType : std::int32_t {
     BEARER = 0,       ///< urn:oasis:names:tc:SAML:2.0:cm:bearer
     HOLDER_OF_KEY = 1 ///< urn:oasis:names:tc:SAML:2.0:cm:holder-of-key
@@ -48,7 +48,7 @@ public:
   /// Whether the token may be delegated.
   virtual bool IsDelegable() const = 0;
 
-  /// Whether the token says that its subject is a solution and not a person.
+  /// Whether the token states that its subject is a solution and not a person.
   virtual bool IsSolution() const = 0;
 
   /// Whether the token is a bearer or a holder-of-key token.

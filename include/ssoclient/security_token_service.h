@@ -63,8 +63,8 @@ public:
   /// `token` is null, and `failure` is valid during the call only (`Copy` returns one to keep).
   ///
   /// **It is not called at all when the operation ends with an exception that is not a `Tarvel::Exception`**: `std::bad_alloc`,
-  /// or a class of a negotiation handler's own. The pool logs such an exception, and also anything that the completion
-  /// throws.
+  /// or an exception class of a negotiation handler. The pool logs such an exception, and also anything that the
+  /// completion throws.
   using TokenCompletion =
       std::function<void(const std::shared_ptr<const SamlToken> &token, const Tarvel::Exception *failure)>;
 
@@ -75,8 +75,8 @@ public:
   virtual std::shared_ptr<const SamlToken> AcquireToken(const std::string &username, const std::string &password,
                                                         const TokenSpec &spec) const = 0;
 
-  /// Acquires a token by GSS (SPNEGO) negotiation. `handler` is called on this thread and drives the negotiation, which takes
-  /// as many legs as the two sides need. To limit their number, throw from the handler.
+  /// Acquires a token by GSS (SPNEGO) negotiation. `handler` is called on the caller's thread and drives the
+  /// negotiation, which takes as many legs as the two sides need. To limit their number, throw from the handler.
   /// @throws CommunicationException when the service does not return an identifier of the negotiation.
   /// @throws Tarvel::InvalidArgumentException when the handler returns null. What the handler throws reaches the caller.
   virtual std::shared_ptr<const SamlToken> AcquireTokenByGSS(const TokenSpec &spec,

@@ -17,8 +17,8 @@ class SSLContext;
 
 namespace SsoClient {
 
-/// What is needed to create the client of a token service. It may be changed or destroyed when the call to which it was
-/// passed has returned: the call copies all fields, and takes its own reference to the SSL context.
+/// What is needed to create the client of a token service. It may be changed or destroyed after the call to which it
+/// was passed has returned: the call copies all fields, and takes its own reference to the SSL context.
 struct SecurityTokenServiceConfig {
   /// The address of the service. Its scheme is https or http.
   std::string stsUrl;
@@ -35,8 +35,8 @@ struct SecurityTokenServiceConfig {
   /// context takes its own reference and keeps it as long as it exists. The caller may then release its `Tarvel::Ref`,
   /// or keep it longer.
   Tarvel::Ssl::SSLContext *sslContext = nullptr;
-  /// Connects to the domain controller that `GetOstrelDCName` returns instead of the host of `stsUrl`, if it returns
-  /// one.
+  /// Whether to connect to the domain controller that `GetOstrelDCName` returns, if it returns one, instead of the host
+  /// of `stsUrl`. A `GssNegotiationContext` ignores this field.
   bool useDomainControllerName = false;
 };
 

@@ -19,7 +19,7 @@ XMLBuilderPtr SoapBuilder(const XMLBuilderPtr &header, const XMLBuilderPtr &body
 /// An envelope whose body and timestamp are signed when it is built. Each build makes a new signature.
 class XMLSignedSoapBuilder final : public XMLBaseBuilder {
 public:
-  /// @param header the `wsse:Security` element with its timestamp, which receives the signature
+  /// @param header the `wsse:Security` element, which has the timestamp and receives the signature
   /// @param privateKey not owned: it must live as long as the builder
   /// @param keyInfo a reference to the key that signs; null for none
   XMLSignedSoapBuilder(XMLBuilderPtr header, XMLBuilderPtr body, const Tarvel::Crypto::PrivateKey *privateKey,

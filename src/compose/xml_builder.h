@@ -14,9 +14,9 @@
 
 namespace SsoClient {
 
-/// Makes one element. Immutable once its factory has returned (a composite: once its last child has been added). From then on
-/// several threads may build it at once, and several trees may share it. The exception is a builder that contains a
-/// `PreBuiltElementImpl`: only one tree can have that element.
+/// Makes one element. Immutable after its factory has returned (a composite: after its last child has been added). From
+/// then on several threads may build it at once, and several trees may share it. The exception is a builder that
+/// contains a `PreBuiltElementImpl`: only one tree can have that element.
 class XMLBaseBuilder {
 public:
   /// Sets `out` to the element with its content.
@@ -63,8 +63,8 @@ private:
 
 using XMLCompositePtr = std::shared_ptr<XMLCompositeBuilder>;
 
-/// An element that exists already. Each build returns the same node, not a copy. So it can be added to one tree only: a
-/// second tree refuses it.
+/// An element that exists already. Each build returns the same node, not a copy. So the node can be added to one tree
+/// only: a second tree refuses it.
 class PreBuiltElementImpl final : public XMLBaseBuilder {
 public:
   explicit PreBuiltElementImpl(Tarvel::Ref<Tarvel::Xml::ElementNode> element);

@@ -11,8 +11,8 @@ namespace SsoClient {
 /// A serialised SOAP envelope and the action to post it with. The envelope may carry a password or a bearer token, so
 /// the body is wiped when the record is destroyed or overwritten.
 struct Request {
-  /// The only values of `soapAction`. Two oddities must stay: the spelling of `CHALLANGE`, and that only its path
-  /// begins with "/RSTR".
+  /// The only values of `soapAction`. Two oddities of `CHALLANGE` must stay: its spelling, and its path, the only
+  /// one that begins with "/RSTR".
   static const char *const ISSUE;
   static const char *const RENEW;
   static const char *const VALIDATE;

@@ -21,33 +21,37 @@ public:
   /// @throws Tarvel::InvalidArgumentException for an identity without key or certificate.
   explicit RequestBuilderImpl(const boost::optional<HolderOfKeyConfig> &holderOfKeyConfig);
 
-  /// Signed when there is an identity and the spec asks for a holder-of-key token that is not delegated. The request for a
-  /// delegated token is not signed, although its body asks for holder-of-key.
+  /// The request is signed when there is an identity and the spec asks for a holder-of-key token that is not delegated.
+  /// For a delegated token it is not signed, although its body asks for holder-of-key.
   /// @throws Tarvel::InvalidArgumentException for a lifetime that is not positive, and for a text that XML cannot
   ///         represent.
   void BuildUserPassTokenRequest(const std::string &username, const std::string &password, const TokenSpec &spec,
                                  Request &request) const override;
 
-  /// Signed, and throws, in the same cases as `BuildUserPassTokenRequest`.
+  /// The request is signed in the same cases as that of `BuildUserPassTokenRequest`, and the same exceptions are
+  /// thrown.
   void BuildInitialSPNegoRequest(const TokenSpec &spec, const std::vector<std::uint8_t> &leg,
                                  Request &request) const override;
 
-  /// Never signed.
+  /// The request is never signed.
   void BuildContinuedSPNegoRequest(const std::string &contextId, const std::vector<std::uint8_t> &leg,
                                    Request &request) const override;
 
+  /// The request is signed with the identity's key.
   /// @throws Tarvel::InvalidArgumentException for a lifetime that is not positive, or a confirmation other than the default.
   /// @throws Tarvel::InvalidStateException without an identity.
   void BuildCertificateTokenRequest(const TokenSpec &spec, Request &request) const override;
 
-  /// Signed with the identity's key. The `ds:KeyInfo` of the signature refers to the presented token by its identifier.
+  /// The request is signed with the identity's key. The `ds:KeyInfo` of the signature refers to the presented token by
+  /// its identifier.
   /// @throws Tarvel::InvalidArgumentException for a lifetime that is not positive.
   /// @throws Tarvel::InvalidStateException without an identity.
   void BuildExchangeTokenRequest(const SamlToken &token, const TokenSpec &spec, Request &request) const override;
 
-  /// Never signed.
+  /// The request is never signed.
   void BuildValidateSubjectRequest(const SamlToken &token, Request &request) const override;
 
+  /// The request is signed with the identity's key.
   /// @throws Tarvel::InvalidArgumentException for a lifetime that is not positive, or a token that is not holder-of-key.
   /// @throws Tarvel::InvalidStateException without an identity.
   void BuildRenewRequest(const SamlToken &token, std::int64_t lifetimeSec, Request &request) const override;

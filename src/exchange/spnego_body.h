@@ -15,7 +15,8 @@
 
 namespace SsoClient {
 
-/// The first leg: an issue request whose last element is the leg. Each build gives it a new `Context`: "urn:uuid:" and a UUID.
+/// The first leg: an issue request whose last element is the leg. Each build writes a new `Context`: "urn:uuid:" and a
+/// UUID.
 class XMLBodyBuilderInitialSPNego final : public XMLBaseBuilder {
 public:
   XMLBodyBuilderInitialSPNego(SamlToken::ConfirmationType confirmation, const TokenSpec &spec,

@@ -19,7 +19,7 @@ constexpr std::int64_t LEG_TIMEOUT_MICROSECONDS = 40000000;
 std::shared_ptr<GssNegotiationContext> CreateGssNegotiationContext(const SecurityTokenServiceConfig &config,
                                                                    const TokenSpec &spec) {
   auto requestBuilder = std::make_shared<const RequestBuilderImpl>(config.holderOfKeyConfig);
-  // Without `useDomainControllerName`: the Kerberos ticket is for the host in the address.
+  // `useDomainControllerName` is ignored, because the Kerberos ticket is for the host in the address.
   const HttpsClient client(config.stsUrl, Tarvel::Ref<Tarvel::Ssl::SSLContext>(config.sslContext), config.sslParameter,
                            LEG_TIMEOUT_MICROSECONDS);
   auto responseHandler = std::make_shared<const ResponseHandlerImpl>();

@@ -22,7 +22,7 @@ constexpr std::string_view DS = "http://www.w3.org/2000/09/xmldsig#";
 constexpr std::string_view XS = "http://www.w3.org/2001/XMLSchema";
 constexpr std::string_view XSI = "http://www.w3.org/2001/XMLSchema-instance";
 constexpr std::string_view DELEGATION = "urn:oasis:names:tc:SAML:2.0:conditions:delegation";
-// How these two begin depends on the services that are used. It is set when the library is built.
+// The beginning of these two depends on the services that are used, and is set when the library is built.
 constexpr std::string_view RSA_ADVICE = SSOCLIENT_EXTENSION_AUTHORITY "/names/2009/12/std-ext/WS-Trust1.4/advice";
 constexpr std::string_view RSA_SAML2 = SSOCLIENT_EXTENSION_AUTHORITY "/names/2009/12/std-ext/SAML2.0";
 

@@ -51,7 +51,7 @@ public:
                        const TokenCompletion &completion) const override;
 
   /// The verified token in `xml`; null when `xml` is empty.
-  /// @throws what `CreateSamlToken` throws, but SsoException with the same message instead of ParseException.
+  /// @throws what `CreateSamlToken` throws, except that a ParseException becomes an SsoException with the same message.
   std::shared_ptr<const SamlToken> ToSamlToken(const std::string &xml) const;
 
   /// Sends the first leg of a negotiation and sets `spnego` to the service's response.

@@ -43,7 +43,7 @@ struct TokenFacts {
 /// @throws ParseException when a name, a group or the solution attribute is malformed.
 TokenFacts TakeTokenFacts(SamlAssertionType &&assertion);
 
-/// Each returns whether `attribute` is the one of that kind, by its `Name`. The token uses no other attributes.
+/// The four kinds of attributes that are read; others are ignored. Each function checks the `Name` of `attribute`.
 bool SamlAttributeIsGroupIdentity(const AttributeType &attribute);
 bool SamlAttributeIsSolution(const AttributeType &attribute);
 bool SamlAttributeIsGivenName(const AttributeType &attribute);

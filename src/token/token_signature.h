@@ -13,8 +13,8 @@
 namespace SsoClient {
 
 /// Reads the signature at the cursor, a child of `assertion`, and moves the cursor to the next node. The signature is not
-/// verified yet, but its references are known to include the whole of `assertion`.
-/// @throws ParseException when there is no element, when it is not a signature, and when no reference is to the assertion.
+/// verified yet, but one of its references is to `assertion` or to the whole document.
+/// @throws ParseException when there is no element, when it is not a signature, and when there is no such reference.
 void ParseTokenSignature(NodeFilterIterator &iterator, const Tarvel::Xml::ElementNode &assertion,
                          Tarvel::Ref<Tarvel::Xml::Security::Signature> &signature);
 

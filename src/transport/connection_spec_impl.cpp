@@ -62,7 +62,7 @@ void StartHandshakeOrThrowOurs(const TlsLayer &layer, const Ref<Stream> &socket,
   }
 }
 
-/// Runs on an I/O thread. An exception that leaves it would mean that the completion is never called.
+/// Runs on an I/O thread. If it threw an exception, the completion would never be called.
 void OnSocketConnected(const TlsLayer &layer, const Ref<Stream> &socket, const Exception *failure,
                        const ConnectionSpec::ConnectCompletion &completion) {
   if (failure) {

@@ -3,7 +3,7 @@
 /// The checks by which the assertion parser refuses everything that it does not know.
 ///
 /// A check that fails throws a `ParseException` and does not change its arguments. The message names the element,
-/// unless the caller gives the message. Checks of content use the cursor, so they ignore comments and white space
+/// unless the caller passes the message. Checks of content use the cursor, so they ignore comments and white space
 /// between nodes.
 
 #pragma once
@@ -33,7 +33,7 @@ void RequireEmptyElement(NodeFilterIterator iterator);
 /// The cursor must be past the end. Otherwise the exception has the text `message`.
 void RequireNoFurtherNode(const NodeFilterIterator &iterator, const char *message);
 
-/// `element` must have no attributes but namespace declarations.
+/// `element` must have no attributes except namespace declarations.
 void RequireNoAttributes(const Tarvel::Xml::ElementNode &element);
 
 /// `element` must have all required attributes and may have the optional ones and namespace declarations, but no others. The

@@ -79,7 +79,7 @@ std::string RenderJson(const TokenReport &report) {
       json["unmet"].push_back(request.key);
     }
   }
-  // Everything but ASCII is escaped, so that the text cannot control a terminal.
+  // Everything except ASCII is escaped, so that the text cannot control a terminal.
   return json.dump(2, ' ', true);
 }
 

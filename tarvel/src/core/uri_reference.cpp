@@ -118,7 +118,7 @@ bool SplitAuthority(std::string_view authority, UriReference &parts) noexcept {
          ConsistsOfEscapedOr(parts.userInformation.value_or(""), USER);
 }
 
-/// Whether the path is valid. Without a scheme, its first segment must not contain a ":", because that would end a
+/// Whether the path is valid. Without a scheme, its first segment must not contain a ":", because a ":" would end a
 /// scheme. After an authority the first segment is always empty.
 bool IsPath(const UriReference &parts) noexcept {
   const std::string_view first = parts.path.substr(0, parts.path.find('/'));

@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// Owning handles for OpenSSL's objects. All but two free their object only if OpenSSL has not cleaned itself up.
+/// Owning handles for OpenSSL's objects. All except two free their object only if OpenSSL has not cleaned itself up.
 
 #pragma once
 
@@ -31,7 +31,7 @@ struct OpenSslDeleter {
   }
 };
 
-// The following two free without asking whether OpenSSL has cleaned itself up: only for use under an `OpenSslGuard`.
+// The following two free without a check whether OpenSSL has cleaned itself up: only for use under an `OpenSslGuard`.
 struct OpenSslMemoryDeleter {
   void operator()(unsigned char *memory) const noexcept { OPENSSL_free(memory); }
 };

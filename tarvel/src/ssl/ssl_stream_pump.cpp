@@ -85,7 +85,7 @@ void SSLStreamImpl::AdvanceOnIoThread(Step step) noexcept {
 }
 
 // Another thread may be releasing the last reference, so this function must not take one. While an operation is
-// pending, an operation below or a posted step has a reference, and completes it.
+// pending, an operation below or a posted step has a reference, and completes the pending operation.
 void SSLStreamImpl::OnOpenSslEnd(void *stream) noexcept {
   auto &self = *static_cast<SSLStreamImpl *>(stream);
   {
@@ -203,7 +203,7 @@ void SSLStreamImpl::StartLowerRead() {
                            self->AdvanceOnIoThread([self, count, failure = DescribeLowerFailure(exception)](
                                                        Completions &done) { self->OnLowerRead(count, failure, done); });
                          });
-  m_lowerReads = true; // `OnLowerRead` waits for the lock
+  m_lowerReads = true; // not too late: `OnLowerRead` waits for the lock
 }
 
 void SSLStreamImpl::OnLowerRead(std::size_t count, const LowerFailure &failure, Completions &done) {

@@ -52,7 +52,7 @@ public:
   /// After the handshake: whether an earlier session was resumed.
   bool WasResumed() const noexcept;
 
-  /// Remembers the resumed session once more, if it may be resumed again. @throws std::bad_alloc
+  /// Remembers the resumed session again, if it may be resumed again. @throws std::bad_alloc
   void KeepResumedSession();
 
   /// Decrypts at most `length` bytes. DONE with a `count` of 0 means the server's closing notice.
@@ -67,19 +67,19 @@ public:
   /// Puts TLS's closing notice into the output.
   void AddClosingNotice();
 
-  /// Takes encrypted bytes from the stream below. @throws OutOfMemoryException
+  /// Adds encrypted bytes that the stream below has received. @throws OutOfMemoryException
   void PutInput(const char *bytes, std::size_t count);
 
   /// How many encrypted bytes are ready for the stream below.
   std::size_t GetOutputSize() const noexcept;
 
-  /// Moves at most `maximum` of these bytes to `output`, whose content they replace.
+  /// Moves at most `maximum` bytes that are ready to `output`, and replaces the content of `output`.
   void TakeOutput(std::vector<char> &output, std::size_t maximum);
 
   void DropOutput() noexcept;
 
-  /// Keeps the session of an established connection resumable when the connection ends now: OpenSSL would treat it as
-  /// broken. OpenSSL itself records the errors that do make the session invalid.
+  /// Keeps the session of an established connection resumable when the connection ends now. Otherwise OpenSSL would
+  /// treat the session as broken. OpenSSL itself records the errors that do make the session invalid.
   void KeepResumable() noexcept;
 
   /// Frees the connection.
@@ -95,7 +95,8 @@ public:
   static int OnNewSession(SSL *connection, SSL_SESSION *session) noexcept;
 
 private:
-  /// Called by OpenSSL for each message and each record's header; for a record to send, before it is sent.
+  /// Called by OpenSSL for each message and each record's header; for outgoing records, before they are sent.
+  /// Notes a lack of memory.
   static void OnMessage(int, int, int, const void *, std::size_t, SSL *, void *connection) noexcept;
 
   ConnectionHandle MakeConnection(const ServerIdentity &identity, BIO *&received, BIO *&toSend);

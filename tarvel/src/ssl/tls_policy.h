@@ -8,8 +8,8 @@
 
 namespace Tarvel::Ssl {
 
-/// Sets the whole policy of a new context, and replaces what a configuration of the process has set there. If the
-/// machine's configuration is in use, it stays, and only what it allows beyond this library's rules is removed.
+/// Sets the policy of a new context. If the machine's configuration is in use, it stays, and only what it allows beyond
+/// this library's rules is removed. Otherwise the library's whole policy replaces what OpenSSL's configuration has set.
 /// @throws Crypto::CryptoException, OutOfMemoryException
 void ApplyTlsPolicy(SSL_CTX *context);
 

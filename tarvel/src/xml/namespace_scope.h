@@ -24,11 +24,11 @@ public:
 
   /// Enters an element.
   /// @param tag where its start tag begins.
-  /// @return the number of its declarations, to be given to `Leave`.
+  /// @return the number of its declarations, which `Leave` needs.
   /// @throws XMLParseException when two attributes have the same name, a declaration is not allowed, or too many are in scope.
   std::size_t Enter(const char *tag, const WrittenName &name, const std::vector<AttributeEvent> &attributes);
 
-  /// Leaves the element that was entered last, with that number of declarations.
+  /// Leaves the element that was entered last. `declarations` is what `Enter` returned for that element.
   void Leave(std::size_t declarations) noexcept { m_declarations.resize(m_declarations.size() - declarations); }
 
 private:
@@ -38,7 +38,7 @@ private:
     std::string_view prefix;
     std::string_view written;             // the namespace name, as a view of the source, if nothing was replaced in it
     std::string replaced;                 // the namespace name otherwise
-    std::size_t representative = UNKNOWN; // the first declaration of the same namespace name, once searched for
+    std::size_t representative = UNKNOWN; // the first declaration of the same namespace name; unknown until needed
 
     std::string_view GetNamespace() const noexcept { return replaced.empty() ? written : replaced; }
   };

@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// `NodeArena`, the memory that the nodes of a tree live in.
+/// `NodeArena`, the memory of the nodes of a tree.
 
 #pragma once
 

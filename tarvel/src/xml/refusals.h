@@ -173,7 +173,7 @@ struct SourcePosition {
   std::uint32_t column;
 };
 
-/// Where in `source` the byte at `offset` is.
+/// The line and column of the byte at `offset` in `source`.
 SourcePosition GetPosition(std::string_view source, std::size_t offset) noexcept;
 
 /// Length of the UTF-8 byte order mark that `source` begins with, or 0.

@@ -20,12 +20,12 @@ struct SpnegoSettings {
   std::string service;
   /// The principal to negotiate as, such as "alice@CORP.EXAMPLE"; empty for the first of the cache or the keytab.
   std::string client;
-  /// The credential cache, such as "FILE:/run/user/1000/tickets"; empty for the default one. The Kerberos library takes
-  /// the default one from the environment variable KRB5CCNAME when that is set.
+  /// The credential cache, such as "FILE:/run/user/1000/tickets"; empty for the default one. If the environment
+  /// variable KRB5CCNAME is set, its value is the default one.
   std::string credentialCache;
-  /// A keytab to get a ticket with, such as "FILE:/etc/example/client.keytab"; empty for none. The ticket is kept in
-  /// `credentialCache`, and replaced there when it has expired. If `credentialCache` is empty, the ticket is kept in
-  /// memory until the handler is destroyed, and the default cache is neither read nor written.
+  /// A keytab that is used to get a ticket, such as "FILE:/etc/example/client.keytab"; empty for none. The ticket is
+  /// kept in `credentialCache`, and replaced there when it has expired. If `credentialCache` is empty, the ticket is
+  /// kept in memory until the handler is destroyed, and the default cache is neither read nor written.
   std::string clientKeytab;
   /// Asks for the three-leg form of Kerberos (DCE style), in which the client confirms the service's answer with a
   /// further leg. Only for services that expect it.

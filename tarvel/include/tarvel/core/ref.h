@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// `Ref`, the intrusive counted reference, and `Object`, the base of what it counts.
+/// `Ref`, an intrusive counted reference, and `Object`, the base of the objects that have such references.
 
 #pragma once
 
@@ -14,8 +14,8 @@
 
 namespace Tarvel {
 
-/// Base of the platform's shared objects: a thread-safe count of the references to it. An object starts with no
-/// reference and is destroyed, through its virtual destructor, on the thread that releases the last one.
+/// Base of the platform's shared objects, with a thread-safe count of the references to the object. An object starts
+/// with no reference and is destroyed, through its virtual destructor, on the thread that releases the last one.
 class TARVEL_API Object {
 public:
   Object(const Object &) = delete;

@@ -16,8 +16,8 @@ namespace Tarvel {
 /// cannot be printed, and a plain text becomes one only by an explicit constructor. Any number of threads may read it
 /// while none changes it.
 ///
-/// A copy of the text that `Get` returns is an ordinary text, and so is a text of which this class has made a copy:
-/// overwrite both with `SecureWipe`.
+/// This class does not overwrite other copies: the text from which it was constructed by copying, and a copy that you
+/// make of what `Get` returns. Overwrite them with `SecureWipe`.
 class TARVEL_API SecretText {
 public:
   /// The empty text.

@@ -242,7 +242,7 @@ void CanonicalWalk::GatherNamespaces(const ElementNode &element) {
   }
 }
 
-// At the apex every namespace in scope is new to the output, below it only those that the element itself declares.
+// At the apex, every namespace in scope is new to the output. Below it, only those that the element declares are new.
 void CanonicalWalk::GatherInclusiveNamespaces(const ElementNode &element) {
   const std::size_t first = &element == &m_apex ? 0 : m_openElements.back().bindings;
   for (std::size_t index = first; index < m_bindings.Size(); ++index) {

@@ -36,7 +36,7 @@ struct SignaturePlan {
 std::optional<SignatureAlgorithm> FindSignatureAlgorithm(std::string_view uri);
 std::optional<Crypto::DigestAlgorithm> FindDigestAlgorithm(std::string_view uri);
 
-/// How to verify a signature of that form.
+/// How to verify a signature that has this syntax.
 /// @throws XmlSecurityException naming what is outside the profile.
 SignaturePlan RequireProfile(const SignatureSyntax &syntax);
 

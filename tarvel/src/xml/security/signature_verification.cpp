@@ -143,7 +143,8 @@ void ParsedSignature::RequireTargetContainsSignature(const Node &target, const R
     throw XmlSecurityException("The reference URI \"" + StringUtil::Shorten(reference.uri) +
                                "\" has the enveloped-signature transform, but does not envelop the signature");
   }
-  // Without its document element, a document has no content to sign, and the digest of nothing matches any such document.
+  // If the signature is the document element, nothing remains without it, and the digest of nothing matches every such
+  // document.
   if (plan.omitsSignature && target.GetKind() == NodeKind::DOCUMENT && signature->GetParent() == &target) {
     throw XmlSecurityException("The reference URI \"" + StringUtil::Shorten(reference.uri) +
                                "\" covers nothing but the signature, which the enveloped-signature transform removes");
