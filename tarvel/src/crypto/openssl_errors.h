@@ -46,7 +46,7 @@ private:
   void Note(unsigned long code, const char *data, int flags) const;
 
   const int m_hostErrno;
-  const char *m_newestHostError = nullptr; // the entry's copy of a file name, which identifies the entry; may be null
+  const char *m_newestHostError = nullptr; // identifies the entry: its own copy of a file name; null if there is none
   // What has been collected so far.
   mutable bool m_ranOutOfMemory = false;
   mutable unsigned long m_newest = 0;
