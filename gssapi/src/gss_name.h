@@ -10,9 +10,9 @@
 
 namespace SsoClient::Gssapi {
 
-/// Stores the name in the empty handle.
-/// @throws Tarvel::InvalidArgumentException when the text is not a name of that form. The GSSAPI checks that without
-///         asking the realm.
+/// Converts `text`, a name of the form `form`, and stores the result in `name`, which must be empty.
+/// @throws Tarvel::InvalidArgumentException when `text` does not have that form. The GSSAPI checks this without asking
+///         the realm.
 void ImportName(const std::string &text, gss_const_OID form, NameHandle &name);
 
 /// The same for the name of a service, host-based such as "HTTP@host" or a Kerberos principal such as
@@ -20,8 +20,8 @@ void ImportName(const std::string &text, gss_const_OID form, NameHandle &name);
 /// @throws Tarvel::InvalidArgumentException as above, and when a part of the name is missing.
 void ImportServiceName(const std::string &service, NameHandle &name);
 
-/// The mechanism SPNEGO, 1.3.6.1.5.5.2 (RFC 4178). The GSSAPI's declarations take a pointer to non-const, but it does
-/// not write there.
+/// The mechanism SPNEGO, 1.3.6.1.5.5.2 (RFC 4178). The GSSAPI's declarations require a pointer to non-const, but the
+/// GSSAPI does not write through it.
 gss_OID SpnegoMechanism() noexcept;
 
 /// The mechanism Kerberos, 1.2.840.113554.1.2.2 (RFC 1964).

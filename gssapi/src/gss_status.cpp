@@ -8,11 +8,11 @@ namespace SsoClient::Gssapi {
 
 namespace {
 
-/// A status has a few texts, one for each of its parts. The limit ends the loop even if the GSSAPI always reports one
-/// more.
+/// A status has a few texts, one for each of its parts. The limit ends the loop even if the GSSAPI always reports
+/// another one.
 constexpr int MAX_TEXTS = 16;
 
-/// The texts of one of the two codes.
+/// The texts of a major or a minor status.
 std::string DescribeCode(OM_uint32 code, int kind, gss_OID mechanism) {
   std::string all;
   OM_uint32 rest = 0; // the GSSAPI's mark for the next text; 0 again after the last
@@ -35,7 +35,7 @@ std::string DescribeCode(OM_uint32 code, int kind, gss_OID mechanism) {
 } // namespace
 
 std::string DescribeStatus(const GssStatus &status, gss_OID mechanism) {
-  // The mechanism's texts first, because the next failure may overwrite them.
+  // Asks for the mechanism's texts first, because the next failure may overwrite them.
   const std::string minorText = status.minor == 0 ? "" : DescribeCode(status.minor, GSS_C_MECH_CODE, mechanism);
   std::string text = DescribeCode(status.major, GSS_C_GSS_CODE, GSS_C_NO_OID);
   if (!minorText.empty()) {

@@ -68,13 +68,14 @@ struct ResultOf<const SecurityTokenService::ValidityCompletion &> {
 ///     const std::string subject = token.get()->GetSubject().ToString();
 ///
 /// `get` throws the operation's failure in its own class, for example `InvalidCredentialsException`. When the operation ends
-/// without a call of its completion (see `SecurityTokenService::TokenCompletion`), it throws `std::future_error` with the code
-/// `std::future_errc::broken_promise`. Destroying the future neither waits for the operation nor cancels it.
+/// without a call of its completion (see `SecurityTokenService::TokenCompletion`), `get` throws `std::future_error`
+/// with the code `std::future_errc::broken_promise`. Destroying the future neither waits for the operation nor cancels
+/// it.
 ///
 /// Never wait for a future in a completion of this library, nor in a work item of the platform's thread pool: the operation
 /// may need the thread that waits. After `fork`, the child must not wait for a future of its parent, which never becomes ready
 /// there.
-/// @param operation one of the operations of `SecurityTokenService` with "Async"
+/// @param operation one of the operations of `SecurityTokenService` with "Async" in their names
 /// @param arguments all its arguments except the completion. The operation copies or shares them.
 /// @throws what `operation` throws itself, for example Tarvel::InvalidStateException when the pool cannot start a thread.
 template <typename... Parameters, typename... Arguments>

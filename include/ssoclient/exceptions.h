@@ -8,8 +8,8 @@
 /// `Tarvel::Xml::Security::XmlSecurityException`. Catch `Tarvel::Exception`, the base of all of them, to catch every failure
 /// of the library except `std::bad_alloc`.
 ///
-/// An exception carries a message and no further fields. The comments below quote how messages begin, where programs may rely
-/// on it.
+/// An exception carries a message and no further fields. Where programs may rely on the beginning of a message, the
+/// comments below quote it.
 
 #pragma once
 

@@ -10,7 +10,7 @@
 namespace SsoClient {
 
 /// Reads the assertion at the cursor and moves the cursor to the next node. Only the form that the token service issues is
-/// accepted: these elements in this order with these attributes, and no others.
+/// accepted: its elements in their order with their attributes, and no others.
 ///
 /// All parsing functions have the same steps: check the name of the element, its attributes, its children in order, and that
 /// nothing follows them; then move to the next sibling. The first failure ends the parse and leaves the record partly filled.

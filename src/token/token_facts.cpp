@@ -26,7 +26,7 @@ bool HasBothSides(const std::string &text, std::size_t separator) {
   return separator != std::string::npos && separator != 0 && separator + 1 != text.size();
 }
 
-/// Whether a restriction allows at least one more use. Without a number it allows none.
+/// Whether a restriction allows at least one more use. Without a number it allows no use.
 template <typename Restriction>
 bool Allows(const boost::optional<Restriction> &restriction) {
   return restriction && restriction->Count && *restriction->Count != 0;

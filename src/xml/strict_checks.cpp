@@ -158,7 +158,7 @@ void GetULongOptionalAttribute(const ElementNode &element, std::string_view name
   }
   const std::string_view text = attribute->GetValue();
   std::uint64_t value = 0;
-  // Signs and digit grouping are refused first: the conversion alone would read "-1" as a number near 2^64.
+  // Signs and digit grouping are refused first: the conversion would read "-1" as a number near 2^64.
   if (text.find_first_not_of(DIGITS) != std::string_view::npos ||
       !boost::conversion::try_lexical_convert(text.data(), text.size(), value)) {
     Refuse("%1/@%2 is not a non-negative integer.", element.GetName(), name);

@@ -14,7 +14,7 @@
 namespace SsoClient {
 
 /// Reads `reader` to its end and sets `document` to what was read. When it throws, `document` keeps its value.
-/// @throws Tarvel::Xml::XMLParseException and Tarvel::IOException as the platform's parser does.
+/// @throws Tarvel::Xml::XMLParseException and Tarvel::IOException like the platform's parser.
 void ParseXML(Tarvel::Reader &reader, Tarvel::Ref<Tarvel::Xml::Document> &document);
 
 /// The same for a text.

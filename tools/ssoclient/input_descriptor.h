@@ -12,9 +12,9 @@ namespace SsoClient::Tool {
 /// Owns a descriptor and closes it, unless it is standard input.
 class InputDescriptor {
 public:
-  /// Opens the file `path`; "-" is standard input. @throws Tarvel::IOException naming the path.
+  /// Opens the file `path`; "-" is standard input. @throws Tarvel::IOException whose message has the path.
   explicit InputDescriptor(const std::string &path);
-  /// Takes over `descriptor`.
+  /// Becomes the owner of `descriptor`.
   explicit InputDescriptor(int descriptor) noexcept : m_descriptor(descriptor) {}
   InputDescriptor(const InputDescriptor &) = delete;
   InputDescriptor &operator=(const InputDescriptor &) = delete;

@@ -102,8 +102,8 @@ std::string OptionName(const std::string &argument) {
   return argument.compare(0, 2, "--") == 0 ? argument.substr(0, argument.find('=')) : argument.substr(0, 2);
 }
 
-/// Describes what the command line should not have: the first unknown option, or else an argument. That argument, and
-/// the option's, are left out, since they may be secrets in the wrong place.
+/// Describes what the command line should not have: the first unknown option or, if there is none, an argument. The
+/// text of an argument, and of an option's argument, is left out, because it may be a secret in the wrong place.
 std::string DescribeExtras(const std::vector<std::string> &extras) {
   const auto option = std::find_if(extras.begin(), extras.end(), IsOption);
   return option == extras.end() ? "too many arguments" : "not expected: " + OptionName(*option);

@@ -72,7 +72,7 @@ std::string Printable(std::string_view text) {
   while (!text.empty()) {
     const Decoded decoded = DecodeFirst(text);
     if (CanSteerTerminal(decoded.codePoint)) {
-      std::array<char, 12> escaped{}; // room for any 32 bits
+      std::array<char, 12> escaped{}; // enough for any 32 bits
       std::snprintf(escaped.data(), escaped.size(), "\\u%04X", decoded.codePoint);
       out += escaped.data();
     } else {

@@ -68,8 +68,8 @@ std::uint32_t CountComputing() noexcept {
   return threads;
 }
 
-/// 1 when the calling thread computes, so that it forks within its own computation. This happens in a signal handler
-/// and in a module that OpenSSL has loaded. A child of such a fork is expected to execute another program.
+/// 1 when the calling thread computes, which means that it forks within its own computation. This happens in a signal
+/// handler and in a module that OpenSSL has loaded. A child of such a fork is expected to execute another program.
 std::uint32_t CountOwn() noexcept {
   return depth > 0 ? 1 : 0;
 }

@@ -3,7 +3,7 @@
 /// Makes `fork` safe in a process that runs our threads: `fork` waits until no thread holds a lock.
 ///
 /// A child has only the thread that forked. A lock that another thread held at that moment, in our code or in
-/// OpenSSL, stays locked in the child for ever. So each thread declares when it computes, `fork` waits until no thread
+/// OpenSSL, stays locked in the child forever. So each thread declares when it computes, `fork` waits until no thread
 /// does, and a thread that is about to begin waits for `fork`. A thread that waits for the network or runs the host's
 /// code does not count as computing.
 
@@ -48,9 +48,9 @@ private:
   std::mutex m_mutex;
 };
 
-/// The number of forks between the process that first used the platform and this one. An object that was made when the
-/// number was another one belongs to a parent: its threads do not exist here, and what it shares with the parent must
-/// not be touched.
+/// The number of forks between the process that first used the platform and this one. An object that was made at
+/// another number belongs to a parent: its threads do not exist here, and what it shares with the parent must not be
+/// touched.
 unsigned GetForkGeneration() noexcept;
 
 /// Acts when the process forks.

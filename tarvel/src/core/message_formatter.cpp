@@ -11,7 +11,7 @@ namespace Tarvel {
 
 namespace {
 
-/// Room for the longest text of a 64-bit integer in base 10 or 16, or of a double in its shortest form.
+/// Enough for the longest text of a 64-bit integer in base 10 or 16, or of a double in its shortest form.
 constexpr std::size_t NUMBER_TEXT_LENGTH = 32;
 
 template <typename T, typename... Base>

@@ -10,7 +10,8 @@
 
 namespace Tarvel::Crypto {
 
-/// Never null, never freed. Safe on any thread; after the first call it costs one load.
+/// OpenSSL's implementation of `algorithm`, never null and never freed. Safe on any thread; after the first call it
+/// costs one load.
 /// @throws CryptoException when the cryptographic library does not offer the algorithm.
 const EVP_MD *GetDigestMethod(DigestAlgorithm algorithm);
 

@@ -10,8 +10,8 @@
 
 namespace Tarvel::Crypto {
 
-/// Whether `text` begins with a URI scheme (RFC 3986, section 3.1) of two or more characters and a colon. The path of a
-/// file with such a name must be written as "./name".
+/// Whether `text` begins with a URI scheme (RFC 3986, section 3.1) of two or more characters, followed by a colon. The
+/// path of a file with such a name must be written as "./name".
 bool IsKeyUri(const std::string &text);
 
 /// @throws NoKeyException, WrongPassphraseException, CryptoException, IOException when `LoadPrivateKey` does, but

@@ -33,7 +33,7 @@ Configuration Decide(Configuration wanted) noexcept {
 }
 
 /// Throws if the default provider cannot be loaded. It must not return null: OpenSSL would then use its default
-/// context, with the providers there.
+/// context with that context's providers.
 OSSL_LIB_CTX *CreateLibraryContext(const OpenSslErrorScope &errors) {
   OSSL_LIB_CTX *const context = OSSL_LIB_CTX_new();
   if (!context || !OSSL_PROVIDER_load(context, "default")) {

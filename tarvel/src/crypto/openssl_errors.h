@@ -33,7 +33,7 @@ public:
   std::string TakeText() const;
 
   /// @throws OutOfMemoryException when memory ran out.
-  /// @throws CryptoException with `message`, followed by ": " and `TakeText` when there is any.
+  /// @throws CryptoException with `message`, followed by ": " and the result of `TakeText` if that is not empty.
   [[noreturn]] void Throw(const std::string &message) const;
 
   /// The message that `Throw` would use. @throws OutOfMemoryException when memory ran out.
@@ -41,12 +41,12 @@ public:
 
 private:
   const Computation m_computing;
-  /// Moves the errors from the queue to the members below.
+  /// Reads the errors in the queue into the members below.
   void Collect() const;
   void Note(unsigned long code, const char *data, int flags) const;
 
   const int m_hostErrno;
-  const char *m_newestHostError = nullptr; // identifies an entry by its own copy of a file name; null if there is none
+  const char *m_newestHostError = nullptr; // identifies the entry: its own copy of a file name; null if there is none
   // What has been collected so far.
   mutable bool m_ranOutOfMemory = false;
   mutable unsigned long m_newest = 0;

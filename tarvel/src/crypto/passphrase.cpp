@@ -6,7 +6,7 @@
 
 namespace Tarvel::Crypto {
 
-// The callback may wait while the user types, or start a program that asks.
+// The guard is suspended because the callback may wait while the user types, or start a program that asks.
 SecretText Passphrase::Ask() {
   m_guard.Suspend();
   try {

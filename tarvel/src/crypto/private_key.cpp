@@ -41,7 +41,7 @@ int GivePassphrase(char *buffer, int size, int, void *secret) {
   return static_cast<int>(text.size());
 }
 
-// PKCS#8 or one of the traditional forms, not encrypted. Null if it does not decode, or bytes follow it; the caller's
+// PKCS#8 or one of the traditional forms, not encrypted. Null if it does not decode or bytes follow it; the caller's
 // error scope has the reason.
 KeyHandle DecodePlain(std::string_view der) {
   const unsigned char *position = BytesOf(der);

@@ -20,7 +20,7 @@ enum class SignatureScheme { RSA_PKCS1, RSA_PSS, ECDSA };
 
 enum class KeyKind { RSA, EC_P256, EC_P384, EC_P521, OTHER };
 
-/// The kind of the certificate's public key; for RSA, `bits` is set to the size of the modulus.
+/// The kind of the certificate's public key. `bits` is set to the size of the RSA modulus or of the curve's order.
 KeyKind GetKeyKind(const Certificate &certificate, unsigned &bits);
 
 /// Whether an RSA key's public exponent is odd and at least 3; true for other kinds of keys.
@@ -28,7 +28,8 @@ bool HasAcceptableExponent(const Certificate &certificate);
 
 /// Whether `signature` is the signature by the certificate's key over a message with that digest. An ECDSA value is r
 /// and s one after the other, as in XML Signature (RFC 4050, section 3.3). RSA-PSS uses MGF1 with the same digest, and
-/// a salt as long as the digest. False for malformed values. Safe on any thread; costs little beyond the arithmetic.
+/// a salt as long as the digest. False for malformed values, and when the key does not match the scheme. Safe on any
+/// thread; costs little beyond the arithmetic.
 /// @throws CryptoException when the cryptographic library itself fails; InvalidStateException when it has cleaned itself up;
 ///         OutOfMemoryException. An exception says nothing about the signature.
 bool VerifyDigest(const Certificate &certificate, SignatureScheme scheme, DigestAlgorithm algorithm,

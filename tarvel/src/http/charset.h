@@ -15,8 +15,8 @@ std::string FindCharset(std::string_view contentType);
 
 /// Converts a body that is declared as ISO-8859-1, under any of the names that IANA lists, to UTF-8. If the body also
 /// begins with an XML declaration that says ISO-8859-1, the declaration is changed to UTF-8. The old memory of the body
-/// is wiped. A body is not changed if it is declared as anything else, or if it is not ASCII but valid UTF-8: a wrong
-/// declaration is more likely than such a text in ISO-8859-1.
+/// is wiped. A body is not changed if it is declared as anything else, or if it is valid UTF-8 with characters beyond
+/// ASCII: a wrong declaration is more likely than such a text in ISO-8859-1.
 void RecodeToUtf8(std::string &body, std::string_view charset);
 
 } // namespace Tarvel::Http

@@ -86,7 +86,7 @@ void ChunkedBodyDecoder::TakeCharacter(char c, std::size_t bodyLength) {
     return;
   case Expected::DATA:
   case Expected::NOTHING:
-    return; // not called in these states: `Put` handles data itself, and takes nothing after the end
+    return; // not called in these states: `Put` handles data itself, and reads nothing after the end
   }
 }
 

@@ -23,7 +23,7 @@ struct RequestData {
 };
 
 /// The whole message as it is sent.
-/// @param host for the Host header. @param cookies for the Cookie header; empty for none.
+/// @param host for the Host header. @param cookies for the Cookie header; empty if there are none.
 SecretText Serialise(const RequestData &request, std::string_view host, std::string_view cookies);
 
 class ClientRequestImpl final : public ClientRequest {

@@ -75,7 +75,7 @@ std::optional<int> FindMonth(std::string_view token) {
   return found == NAMES.end() ? std::nullopt : std::optional<int>(static_cast<int>(found - NAMES.begin()) + 1);
 }
 
-/// Assigns `token` to the first field that has no value yet and that it fits, in the order of the standard.
+/// Assigns `token` to the first field that has no value yet and that it matches, in the order of the standard.
 void TakeToken(std::string_view token, DateFields &fields) {
   if (!fields.hour && TakeTime(token, fields)) {
     return;

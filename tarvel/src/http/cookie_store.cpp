@@ -22,12 +22,12 @@ namespace Tarvel::Http {
 
 namespace {
 
-constexpr std::size_t MAX_COOKIES = 50;        // the minimum for a domain by RFC 6265, section 6.1
-constexpr std::size_t MAX_COOKIE_BYTES = 4096; // the minimum for a cookie there; here for name and value together
+constexpr std::size_t MAX_COOKIES = 50;        // RFC 6265, section 6.1: at least this many for a domain
+constexpr std::size_t MAX_COOKIE_BYTES = 4096; // at least this many for a cookie; here for name and value together
 constexpr std::int64_t MICROSECONDS = 1000000; // in a second
 
-/// A cookie is sent only to the host that set it. A Domain attribute could extend that to a whole domain, but only a
-/// list that is kept up to date can say whether a domain is a public suffix such as "co.uk". A user agent sends to one
+/// A cookie is sent only to the host that set it. A Domain attribute could extend this to a whole domain, but only a
+/// list that is kept up to date can show whether a domain is a public suffix such as "co.uk". A user agent sends to one
 /// host only and needs no cookies of other hosts.
 struct Cookie {
   std::string name;

@@ -15,9 +15,9 @@ namespace Tarvel::Http {
 const std::shared_ptr<const Exception> &OutOfMemory();
 
 /// Must be called while an exception is being handled. A `Tarvel::Exception` is copied with its own class. For
-/// `std::bad_alloc`, and for an exception that cannot be copied for lack of memory, `OutOfMemory()` is returned, which
-/// must have been called before. Anything else becomes an InvalidStateException about the request to `endpoint`, with
-/// its text.
+/// `std::bad_alloc`, and for an exception that cannot be copied for lack of memory, the result is that of
+/// `OutOfMemory()`, which must have been called before. Anything else becomes an InvalidStateException about the
+/// request to `endpoint`, with the text of what was thrown.
 std::shared_ptr<const Exception> CurrentFailure(const std::string &endpoint) noexcept;
 
 } // namespace Tarvel::Http

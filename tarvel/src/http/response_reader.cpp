@@ -66,7 +66,7 @@ bool IsInterim(int status) noexcept {
   return status / 100 == 1 && status != SWITCHING_PROTOCOLS;
 }
 
-/// Whether the status alone is the answer, so that no body is read.
+/// Whether the status is the whole answer, so that no body is read.
 bool IsRefusal(int status) noexcept {
   return status / 100 != 2 && status != INTERNAL_SERVER_ERROR && !IsInterim(status);
 }
@@ -249,7 +249,7 @@ void ResponseReader::ChooseBody() {
   m_stage = m_length == 0 ? Stage::COMPLETE : Stage::BODY_OF_LENGTH;
 }
 
-/// Every request says that it accepts no coding. Without this check, encoded content would be treated as text.
+/// Every request states that it accepts no coding. Without this check, encoded content would be treated as text.
 void ResponseReader::CheckContentCoding() const {
   for (const auto &[name, value] : m_data.fields) {
     if (EqualsIgnoringCase(name, "Content-Encoding") && !value.empty() && !EqualsIgnoringCase(value, "identity")) {

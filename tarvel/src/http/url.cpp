@@ -95,7 +95,7 @@ std::optional<int> ReadNumber(std::string_view digits) noexcept {
   return number;
 }
 
-/// Does not check the text in the brackets of an address and the range of the port: their failures have other messages.
+/// Does not check the text in the brackets of an address or the range of the port: their failures have other messages.
 UriReference Parse(std::string_view url) {
   const std::optional<UriReference> parts = SplitUriReference(url);
   if (!parts || (parts->port && !ReadNumber(*parts->port))) {

@@ -76,7 +76,7 @@ private:
   std::string m_target;      // "host:port" or "[v6 address]:port", for messages; set once
   int m_port = 0;
 
-  // How reading and writing ended. Kept, because another read or write in Asio may wait for ever.
+  // How reading and writing ended. Kept, because another read or write in Asio may wait forever.
   boost::system::error_code m_readEnd;
   boost::system::error_code m_writeEnd;
 
@@ -87,7 +87,7 @@ private:
   Ref<ScheduledItem> m_lookup;
   AddressList m_addresses;
   std::size_t m_nextAddress = 0;
-  std::string m_attempts; // the reasons of those that failed
+  std::string m_attempts; // why the addresses tried so far failed
   boost::asio::steady_timer m_attemptTimer;
   bool m_isAttemptOverdue = false;
 };

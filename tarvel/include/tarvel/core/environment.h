@@ -18,8 +18,8 @@ struct Environment {
   std::function<std::string()> uuid;             ///< a UUID's text
 };
 
-/// Replaces the real clock and UUID source by other ones, for the whole process, until this object is destroyed. Scopes
-/// nest. The functions are called on any thread. For tests: a service must never use it.
+/// Replaces the real clock and UUID source for the whole process until this object is destroyed. Scopes nest. The
+/// functions are called on any thread. For tests: a service must never use it.
 class TARVEL_API ScopedEnvironment {
 public:
   /// From now on, the functions of `environment` replace the real sources.

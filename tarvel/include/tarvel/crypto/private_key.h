@@ -42,8 +42,8 @@ protected:
   ~PrivateKey() override;
 };
 
-/// Returns the passphrase of an encrypted key. Called on the calling thread, at most once per call; it may block. The text is
-/// wiped after use. An empty function means that there is no passphrase.
+/// Returns the passphrase of an encrypted key. A function below calls it on the caller's thread, at most once; it may
+/// block. The text is wiped after use. An empty function means that there is no passphrase.
 using PassphraseCallback = std::function<std::string()>;
 
 /// The first private key in PEM text (PKCS#8, plain or encrypted, or the traditional forms) or in DER.

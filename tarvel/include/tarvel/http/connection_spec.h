@@ -20,13 +20,14 @@ class TARVEL_API ConnectionSpec : public Object {
 public:
   /// Called exactly once for each start that has not thrown, on an I/O thread: with the stream and null, or with an
   /// exception and perhaps a stream. The exception is valid during the call. The function must not block, nor wait for
-  /// another operation: start the next one from it.
+  /// another operation. It may start the next operation.
   using ConnectCompletion = std::function<void(const Ref<System::Stream> &, const Exception *)>;
 
   /// One line for logs. The platform does not read it.
   virtual std::string ToString() const = 0;
 
-  /// The host that requests go to, for the Host header and the cookies; an IPv6 address with or without brackets.
+  /// The host to which requests are sent, for the Host header and the cookies; an IPv6 address with or without
+  /// brackets.
   virtual std::string GetHost() const = 0;
 
   /// "host:port", for messages. The port, after the last colon, is also used for the Host header.

@@ -48,9 +48,9 @@ protected:
 /// header states the body's length or coding in a wrong way, that header and the ones after it are missing.
 ///
 /// The body is returned as it was received, with one exception: a body that the charset of its media type declares as
-/// ISO-8859-1, under any of the names that IANA lists, is returned as UTF-8, unless it is valid UTF-8 and not ASCII
-/// already. If its XML declaration says ISO-8859-1, that is changed to UTF-8. Such a body is at most twice as long as
-/// the received one.
+/// ISO-8859-1, under any of the names that IANA lists, is returned as UTF-8, unless it already is valid UTF-8 with
+/// characters beyond ASCII. If its XML declaration says ISO-8859-1, that is changed to UTF-8. Such a body is at most
+/// twice as long as the received one.
 class TARVEL_API ClientResponse : public Reader {
 public:
   /// The status code of the status line, for example 200.
@@ -84,9 +84,9 @@ class TARVEL_API UserAgent : public Object {
 public:
   /// Called exactly once for each start, on an I/O thread: with null and the whole response, or with an exception and
   /// null. When memory runs out, the exception is an `OutOfMemoryException`. When another library, a stream, a
-  /// connection specification or a cookie store throws something that is not a `Tarvel::Exception`, it is an
-  /// `InvalidStateException` with the text of what was thrown. The exception is valid during the call. The item is the
-  /// one that `StartRequest` returns. An exception that the function throws is logged and has no other effect. The
+  /// connection specification or a cookie store throws something that is not a `Tarvel::Exception`, the exception is an
+  /// `InvalidStateException` with the text of what was thrown. It is valid only during the call. The item is the one
+  /// that `StartRequest` returns. An exception that the function throws is logged and has no other effect. The
   /// function must not block, nor wait for another request: there are only two I/O threads, and that request completes
   /// on one of them. Start the next request from here, and queue work that takes time on a thread pool. The function is
   /// never called in a child that `fork` has made after the start.
@@ -109,7 +109,7 @@ public:
   /// which would wait for itself.
   /// @param timeoutMicroseconds counted from this call; when it has passed, the request is cancelled.
   /// @throws System::TimeoutException after the time-out; System::NetworkException, at once, in a child that `fork` made
-  ///         while the request was under way; otherwise the exception that the request failed with, in its own class;
+  ///         while the request was under way; otherwise the exception with which the request failed, in its own class;
   ///         InvalidArgumentException for an item that is not a request.
   virtual void WaitForRequest(const Ref<PendingRequestItem> &pending, std::int64_t timeoutMicroseconds,
                               Ref<ClientResponse> &response) = 0;
@@ -125,7 +125,7 @@ protected:
 TARVEL_API void CreateHttpUserAgent(const Ref<ConnectionSpec> &spec, const Ref<CookieStore> &cookies,
                                     const Ref<ConnectionPool> &pool, Ref<UserAgent> &out);
 
-/// Returns the user agent that the form above makes without a connection pool.
+/// Returns the user agent that the function above makes without a connection pool.
 /// @throws InvalidArgumentException when `spec` or `cookies` is null.
 inline Ref<UserAgent> CreateHttpUserAgent(const Ref<ConnectionSpec> &spec, const Ref<CookieStore> &cookies) {
   Ref<UserAgent> userAgent;
@@ -139,7 +139,7 @@ inline Ref<UserAgent> CreateHttpUserAgent(const Ref<ConnectionSpec> &spec, const
 /// @throws InvalidArgumentException when `method` or `path` is not allowed in a request line.
 TARVEL_API void CreateHttpRequest(std::string_view method, std::string_view path, Ref<ClientRequest> &out);
 
-/// Returns the request that the form above makes. @throws InvalidArgumentException as above.
+/// Returns the request that the function above makes. @throws InvalidArgumentException as above.
 inline Ref<ClientRequest> CreateHttpRequest(std::string_view method, std::string_view path) {
   Ref<ClientRequest> request;
   CreateHttpRequest(method, path, request);

@@ -30,8 +30,8 @@ public:
 
   /// The date-time written in `text`, of the form xsd:dateTime (XML Schema 1.0, part 2, section 3.2.7): four-digit
   /// year, any number of fraction digits (all after the sixth are ignored), zone "Z", "+hh:mm", "-hh:mm" up to 14
-  /// hours, or none, which means UTC. 24:00:00 is the next day's start. No white space around it. The fields are shown
-  /// in the zone of the text.
+  /// hours, or none, which means UTC. 24:00:00 is the next day's start. White space around it is not accepted. The
+  /// fields are shown in the zone of the text.
   /// @throws DateTimeFormatException when the text has another form or a field is out of range.
   explicit DateTime(std::string_view text);
 
@@ -113,8 +113,8 @@ DateTime DateTime::FromTimePoint(std::chrono::time_point<std::chrono::system_clo
   constexpr long double FAR_AWAY = 4e17L;
   const long double roughly = std::chrono::duration<long double, std::micro>(time.time_since_epoch()).count();
   if (roughly > -FAR_AWAY && roughly < FAR_AWAY) {
-    // In two parts, because the product of a long time and a fine period would overflow. Not by `floor`, which compares in that
-    // period.
+    // The whole seconds and the rest are converted separately, because one conversion of a long time in a fine period
+    // would overflow. `floor` would, too, for the seconds: it compares in the fine period.
     const auto sinceEpoch = time.time_since_epoch();
     const auto whole = std::chrono::duration_cast<std::chrono::seconds>(sinceEpoch);
     return DateTimeFromUtc(microseconds(whole).count() + std::chrono::floor<microseconds>(sinceEpoch - whole).count(),

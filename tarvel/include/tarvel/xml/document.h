@@ -16,7 +16,7 @@ public:
   /// The node above all others; never null.
   virtual const DocumentNode *GetDocumentNode() const noexcept = 0;
 
-  /// The document element, or null once it has been moved to another tree.
+  /// The document element, or null after it has been moved to another tree.
   virtual const ElementNode *GetDocumentElement() const noexcept = 0;
   virtual ElementNode *GetDocumentElement() noexcept = 0;
 
