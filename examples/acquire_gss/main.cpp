@@ -1,7 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// Acquires a token by a Kerberos ticket, from the default credential cache or obtained with a keytab, and writes its
-/// XML to standard output.
+/// Acquires a token with a Kerberos ticket and writes the token's XML to standard output. The ticket is in the default
+/// credential cache, or is obtained with a keytab.
 ///
 /// Usage: kinit alice && acquire_gss https://sts.corp.example/STS/trust authority.pem sts.pem HTTP@sts.corp.example
 /// >token.xml

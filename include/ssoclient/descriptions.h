@@ -31,13 +31,13 @@ std::string AsString(const std::vector<Element> &elements, const Describe &descr
   return text;
 }
 
-/// The principal and the time of a delegation. `delegate` is not null.
+/// The principal and the time of a delegation. `delegate` must not be null.
 SSOCLIENT_API std::string WriteDelegate(const Delegate *delegate);
 
-/// The name and the values of an attribute. `attribute` is not null.
+/// The name and the values of an attribute. `attribute` must not be null.
 SSOCLIENT_API std::string WriteAdviceAttribute(const AdviceAttribute *attribute);
 
-/// The source of an advice and its attributes. `advice` is not null.
+/// The source of an advice and its attributes. `advice` must not be null.
 SSOCLIENT_API std::string WriteAdvice(const Advice *advice);
 
 /// All fields of a specification. The text is not secret, but contains the names of principals.

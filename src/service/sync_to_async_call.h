@@ -44,7 +44,7 @@ void SyncCallToResultFunc(const Call &call, const Callback &callback, const Fail
     callback(failureValue, &failure);
     return;
   }
-  // Outside the block above: an exception of the callback is not a failure of the call, and is not reported to the callback.
+  // Outside the try block: an exception of the callback is not a failure of the call, and not reported to the callback.
   callback(result, nullptr);
 }
 

@@ -21,7 +21,7 @@ using Tarvel::Xml::ElementNode;
 constexpr QNameView DELEGATION_RESTRICTION_TYPE(Namespaces::DELEGATION, "DelegationRestrictionType");
 constexpr QNameView RENEW_RESTRICTION_TYPE(Namespaces::RSA_SAML2, "RenewRestrictionType");
 
-/// The `saml:Condition` of that type at the cursor, or null when another node is there.
+/// The `saml:Condition` at the cursor if it has that type, otherwise null.
 const ElementNode *ConditionOfType(const NodeFilterIterator &iterator, const QNameView &type) {
   const ElementNode *const element = IteratorToElement(iterator);
   return ElementQNameIs(element, "Condition", Namespaces::SAML) && ElementXsiTypeIs(*element, type) ? element : nullptr;
@@ -132,7 +132,7 @@ bool TryParseRenewRestriction(NodeFilterIterator &iterator, boost::optional<Rene
                                  {LocalName("Count"), LocalName("Postdatable"), LocalName("RenewExpired")});
   restriction.emplace();
   GetULongOptionalAttribute(*element, "Count", restriction->Count);
-  // Content is refused, because it would be signed and still ignored.
+  // Content is refused, because it would be signed but ignored.
   RequireEmptyElement(iterator);
   iterator.MoveToSibling();
   return true;

@@ -26,7 +26,7 @@ public:
   bool IsReuseOnAuthErrorSupported() const override;
   Tarvel::Ref<Tarvel::System::ScheduledItem> AsyncConnect(ConnectCompletion completion) const override;
 
-  /// The host to connect to: the name of the domain controller if it is asked for and known, else the given host.
+  /// The host to connect to: the name of the domain controller if it is asked for and known, otherwise the given host.
   std::string GetConnectionTargetHost() const;
 
 private:
@@ -46,8 +46,8 @@ public:
   std::string GetHost() const override;
   std::string GetEndpointString() const override;
   bool IsReuseOnAuthErrorSupported() const override;
-  /// The item also cancels the handshake. Once the socket is connected, the stream that the completion gets is a
-  /// `Tarvel::Ssl::SSLStream`, even if the handshake failed.
+  /// The item also cancels the handshake. If the socket was connected, the completion gets a `Tarvel::Ssl::SSLStream`,
+  /// even if the handshake failed.
   Tarvel::Ref<Tarvel::System::ScheduledItem> AsyncConnect(ConnectCompletion completion) const override;
 
 private:

@@ -41,8 +41,8 @@ private:
   const std::int64_t m_timeoutMicroseconds;
 };
 
-/// Sets either `error` or `body` from the outcome of an HTTP exchange, and leaves the other unchanged. Status 2xx and 500 give
-/// a body: SOAP 1.1 sends faults with 500. Any other status is an error.
+/// Sets either `error` or `body` from the outcome of an HTTP exchange, and leaves the other unchanged. With
+/// status 2xx or 500 it sets `body`, because SOAP 1.1 sends faults with 500. Any other status is an error.
 /// @param exception the failure of the exchange; null when there is a response
 /// @param error set to a `CommunicationException`
 void TranslateResponse(const Tarvel::Exception *exception, const Tarvel::Ref<Tarvel::Http::ClientResponse> &response,

@@ -79,7 +79,7 @@ void RequirePadding(std::string_view text, std::size_t position, int characters)
   }
 }
 
-/// The characters read so far of a group of four that blanks or the padding interrupt.
+/// The characters that have been read of an incomplete group of four: blanks or the padding interrupt it.
 struct PartialGroup {
   std::uint32_t bits = 0;
   int characters = 0;

@@ -20,7 +20,7 @@ using WideMapping = wint_t (*)(wint_t, locale_t);
 constexpr wint_t LAST_CODE_POINT = 0x10FFFF;
 
 /// The Unicode locale of the C library, whatever locale the host process has chosen. Null when this system does not
-/// have it. It is kept until the process ends.
+/// have it. It is never freed.
 locale_t UnicodeLocale() {
   const Computation computing; // the C library takes a lock
   static std::once_flag once;

@@ -42,9 +42,9 @@ public:
 
 private:
   const OpenSslGuard m_guard;
-  std::optional<OpenSslErrorScope> m_errors; // set by the constructor once it knows that OpenSSL may be called
+  std::optional<OpenSslErrorScope> m_errors; // set by the constructor after it has checked that OpenSSL may be called
   const DigestAlgorithm m_algorithm;
-  void *m_context; // EVP_MD_CTX; null once it is finished
+  void *m_context; // EVP_MD_CTX; null after `Finish` has kept it for another digest
 };
 
 } // namespace Tarvel::Crypto

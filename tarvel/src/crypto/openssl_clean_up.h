@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// `OpenSslCleanUpNotice`, for objects whose operations would wait forever once OpenSSL has cleaned itself up.
+/// `OpenSslCleanUpNotice`, for objects whose operations would wait forever after OpenSSL has cleaned itself up.
 
 #pragma once
 
@@ -8,9 +8,9 @@
 
 namespace Tarvel::Crypto {
 
-/// Calls a function when OpenSSL cleans itself up. The call is on the thread that runs the clean-up, when no use of
-/// OpenSSL can begin any more, and those under way have ended or were waited for long enough. The function is not
-/// called in a child process that is forked later.
+/// Calls a function when OpenSSL cleans itself up, on the thread that runs the clean-up. By then, no use of OpenSSL can
+/// begin any more, and those under way have ended or the wait for them has timed out. The function is not called in a
+/// child process that is forked later.
 class OpenSslCleanUpNotice {
 public:
   using Function = void (*)(void *owner) noexcept;

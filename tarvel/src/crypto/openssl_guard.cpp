@@ -25,7 +25,7 @@ namespace Tarvel::Crypto {
 
 namespace {
 
-/// A use only computes, and takes far less than this.
+/// A use only computes, which takes far less time than this.
 constexpr std::chrono::milliseconds MAX_WAIT{500};
 constexpr std::chrono::microseconds WAIT_STEP{100};
 
@@ -45,7 +45,7 @@ struct Abandoned {
 };
 std::atomic<Abandoned *> abandoned{nullptr};
 
-/// Begins a use and returns the counter that counts it; null once the clean-up has begun.
+/// Begins a use and returns the counter that counts it; null if the clean-up has begun.
 std::atomic<std::uint32_t> *TryBegin() noexcept {
   std::atomic<std::uint32_t> &uses = shards[GetThreadShard(shards.size())].uses;
   uses.fetch_add(1);
@@ -101,12 +101,12 @@ void OpenSslGuard::Abandon(void *object) noexcept {
 }
 
 void OpenSslGuard::Prepare() {
-  // Begins before `call_once`. Otherwise the thread inside it could wait for a fork, the fork for the computation of a
-  // second thread, and that thread for `call_once`.
+  // The computation begins before `call_once`. Otherwise the thread inside `call_once` could wait for a fork, the fork
+  // for the computation of a second thread, and that thread for `call_once`.
   const Computation computing;
   static std::once_flag registered;
   std::call_once(registered, [] {
-    // In this order, because OpenSSL's initialisation registers its clean-up.
+    // OpenSSL is initialised first, because its initialisation registers its clean-up.
     InitialiseOpenSsl();
     const OpenSslErrorScope errors;
     if (OPENSSL_atexit(OnCleanUp) != 1) {

@@ -31,11 +31,11 @@ public:
   static constexpr const char *ENDED = "OpenSSL has cleaned itself up: the process is about to end";
 
   /// `Suspend` interrupts the use while the host's code runs, which may block or fork. `Resume` continues it, and returns
-  /// false once the clean-up has begun.
+  /// false if the clean-up has begun.
   void Suspend() noexcept;
   bool Resume() noexcept;
 
-  /// Initialises OpenSSL and registers for its clean-up. Call this before the first use; any number of times.
+  /// Initialises OpenSSL and registers for its clean-up. Call this before the first use; more calls do no harm.
   /// @throws CryptoException, OutOfMemoryException, and InvalidStateException when OpenSSL has cleaned itself up.
   static void Prepare();
 
@@ -44,7 +44,8 @@ public:
 
 private:
   const Computation m_computing;
-  std::atomic<std::uint32_t> *m_count; // of the shard where the use began; null if the use is suspended or not allowed
+  // Of the shard where the use began or was resumed last; null if the use is suspended or not allowed.
+  std::atomic<std::uint32_t> *m_count;
 };
 
 } // namespace Tarvel::Crypto

@@ -23,8 +23,8 @@
 
 namespace Tarvel::Http {
 
-/// Connects, sends and reads on the I/O threads; the end of each step starts the next. Pending handlers hold references
-/// to the exchange.
+/// Connects, sends and reads on the I/O threads; the end of each step starts the next. Pending handlers keep the
+/// exchange alive.
 class HttpExchange final : public PendingRequestItem {
 public:
   HttpExchange(const Ref<ConnectionSpec> &spec, const Ref<CookieStore> &cookies, RequestData request,
@@ -78,7 +78,7 @@ private:
   const Ref<CookieStore> m_cookies;
   const std::string m_endpoint; // for messages
 
-  // Each is used by one step at a time, so without a lock. The message is kept until it is written.
+  // Only one step at a time uses each of these members, so they need no lock. The message is kept until it is written.
   RequestData m_request;
   SecretText m_message;
   std::array<char, BUFFER_BYTES> m_buffer; // as secret as the response

@@ -16,8 +16,8 @@
 
 namespace Tarvel::Http {
 
-/// The body is secret, and the destructor wipes it. It is not a `SecretText`, because a reader hands it over as a
-/// string, without a copy of what may be 16 MiB.
+/// The body is secret, and the destructor wipes it. The body is not a `SecretText`, because it is passed on as a string
+/// without a copy, which might be 16 MiB long.
 struct ResponseData {
   ResponseData() = default;
   ResponseData(const ResponseData &) = delete;
@@ -37,8 +37,8 @@ class ResponseHeaderParser;
 /// Reads the final response to one request, in pieces of any size, and skips interim ones (1xx except 101). It is
 /// strict where leniency would let two parties read the same bytes differently, or treat a part as the whole. With a
 /// status other than 2xx and 500 the response is complete after its header, whatever the header says about a body. The
-/// messages of its exceptions are parts of sentences, which the caller completes. After an exception it must not be
-/// used again.
+/// messages of the exceptions are parts of sentences, which the caller completes. After an exception the reader must
+/// not be used again.
 class ResponseReader {
 public:
   /// @param answersHead whether the request's method is HEAD, so that no body follows whatever the header says.
@@ -47,13 +47,13 @@ public:
   ResponseReader &operator=(const ResponseReader &) = delete;
   ~ResponseReader();
 
-  /// Takes the next bytes of the connection. Bytes after the response's end are dropped: every request says that the
-  /// connection ends with its response.
+  /// Reads the next bytes of the connection. Bytes after the response's end are dropped: every request asks the server
+  /// to close the connection after the response.
   /// @throws HttpException when the bytes are not a response, contradict themselves, or are over a limit.
   void Put(std::string_view bytes);
 
   /// Must be called at the orderly end of the connection, which also ends a body without a length.
-  /// @throws HttpException when the response is not complete then.
+  /// @throws HttpException when the response is not complete at that point.
   void PutEnd();
 
   bool IsComplete() const noexcept { return m_stage == Stage::COMPLETE; }

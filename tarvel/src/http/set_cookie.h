@@ -15,8 +15,8 @@ namespace Tarvel::Http {
 struct SetCookie {
   std::string name;
   std::string value;
-  std::string domain;                  ///< without a leading dot; empty when there is none
-  std::string path;                    ///< empty when there is none, or it does not begin with "/"
+  std::string domain;                  ///< without a leading dot; empty when absent
+  std::string path;                    ///< empty when absent, or when it does not begin with "/"
   std::optional<std::int64_t> expires; ///< microseconds since 1970, UTC
   std::optional<std::int64_t> maxAge;  ///< seconds from now
   bool isSecure = false;

@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// The one implementation of `SSLStream`: it moves bytes between the TLS connection in memory and the stream below.
+/// The only implementation of `SSLStream`: it moves bytes between the TLS connection in memory and the stream below.
 
 #pragma once
 
@@ -38,7 +38,7 @@ private:
     FRESH,
     HANDSHAKING,
     ESTABLISHED,
-    FAILED ///< or closed: m_failure says why
+    FAILED ///< failed or closed; m_failure is the reason
   };
 
   struct PendingRead {

@@ -17,8 +17,8 @@ namespace Tarvel::Ssl {
 
 namespace {
 
-/// The most sessions that are kept of one connection. A server issues several so that as many connections can resume at
-/// the same time.
+/// At most this many sessions of one connection are kept. A server issues several, so that several connections can
+/// resume at the same time.
 constexpr std::size_t MAX_NEW_SESSIONS = 8;
 
 std::string DescribeSubject(X509 *certificate) {
@@ -150,7 +150,7 @@ std::string TlsConnection::RefuseServer() const {
   return {};
 }
 
-// Looks at the errno that `malloc` has set, because OpenSSL resets it before it sends an alert.
+// Reads the errno that `malloc` has set, before OpenSSL resets it to send an alert.
 void TlsConnection::OnMessage(int, int, int, const void *, std::size_t, SSL *, void *connection) noexcept {
   if (errno == ENOMEM) {
     static_cast<TlsConnection *>(connection)->m_lacksMemory = true;

@@ -38,7 +38,8 @@ std::string RefuseTarget(std::string_view host, int port) {
 }
 
 std::optional<boost::asio::ip::address> ParseAddress(std::string_view host) {
-  // A string: given a view, `make_address` makes a copy itself, where a lack of memory would end the process (`noexcept`).
+  // A string is passed, because `make_address` would copy a view itself. The function is `noexcept`, so a lack of memory
+  // for its copy would end the process.
   const std::string text(IsInBrackets(host) ? host.substr(1, host.size() - 2) : host);
   boost::system::error_code notAnAddress;
   const boost::asio::ip::address address = boost::asio::ip::make_address(text, notAnAddress);

@@ -23,8 +23,8 @@ using NameLookup = std::function<AddressList(const std::string &host)>;
 /// @throws NetworkException when there is no address.
 AddressList LookUpName(const std::string &host);
 
-/// Replaces the resolver by `lookup` for the whole process, for as long as this exists. For tests. `lookup` is called
-/// on any thread, several at once, and may still run after the scope's end. A connection may join a look-up that began
+/// Replaces the resolver by `lookup` for the whole process while this object exists. For tests. `lookup` is called on
+/// any thread, several at once, and may still run after the scope's end. A connection may join a look-up that began
 /// before the scope, so a test whose look-ups hang must wait until they end.
 class ScopedNameLookup {
 public:

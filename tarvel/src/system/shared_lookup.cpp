@@ -38,7 +38,7 @@ struct Registry {
   const Ref<ThreadPool> pool = CreateEndlessThreadPool(MAX_NAME_LOOKUPS, LOOKUP_IDLE_TIME);
   ForkSafeMutex mutex;                                    // never held while a completion runs
   std::map<std::string, std::shared_ptr<Lookup>> lookups; // guarded by mutex; by name
-  unsigned generation = GetForkGeneration();              // guarded by mutex; of the process that started them
+  unsigned generation = GetForkGeneration();              // guarded by mutex; of the process that started the look-ups
 };
 
 Registry &GetRegistry() {
@@ -47,7 +47,7 @@ Registry &GetRegistry() {
   return *registry;
 }
 
-/// Under the registry's lock.
+/// Called under the registry's lock.
 void Forget(Registry &registry, const Lookup &lookup) {
   const auto found = registry.lookups.find(lookup.name);
   if (found != registry.lookups.end() && found->second.get() == &lookup) { // otherwise `lookup` is a parent's
@@ -86,13 +86,13 @@ public:
 
   bool IsDone() const noexcept override { return m_isDone; }
 
-  /// Records this caller's place in the look-up's list. Under the registry's lock.
+  /// Records this caller's place in the look-up's list. Called under the registry's lock.
   void SetPlace(std::shared_ptr<Lookup> lookup, AskerList::iterator place) noexcept {
     m_lookup = std::move(lookup);
     m_place = place;
   }
 
-  /// After this, `Cancel` does nothing. Under the registry's lock.
+  /// After this, `Cancel` does nothing. Called under the registry's lock.
   void ForgetPlace() noexcept { m_lookup.reset(); }
 
   /// Called once, after `ForgetPlace`.
@@ -146,7 +146,7 @@ void Run(Lookup &lookup, const std::string &host) {
   }
 }
 
-/// Starts a look-up for `asker`. Under the registry's lock; the look-up cannot begin before it is released.
+/// Starts a look-up for `asker`. Called under the registry's lock; the look-up begins only after the lock is released.
 std::shared_ptr<Lookup> StartLookup(Registry &registry, const std::string &host, const std::string &name,
                                     const Ref<Asker> &asker) {
   auto lookup = std::make_shared<Lookup>();
@@ -162,7 +162,7 @@ std::shared_ptr<Lookup> StartLookup(Registry &registry, const std::string &host,
   return lookup;
 }
 
-/// In a child process: removes the look-ups of its parent, which never end here. Under the registry's lock.
+/// In a child process: removes the look-ups of its parent, which never end here. Called under the registry's lock.
 /// @return the callers that wait for them. They must be destroyed after the lock is released, and are never called.
 AskerList RemoveLookupsOfParent(Registry &registry) {
   AskerList askers;

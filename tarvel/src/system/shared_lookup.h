@@ -19,8 +19,8 @@ namespace Tarvel::System {
 using LookupCompletion = std::function<void(const AddressList &addresses, const std::exception_ptr &failure)>;
 
 /// Looks up the addresses of `host`. If a look-up of that name, in any letter case, runs or waits for its turn, this
-/// joins it; otherwise it starts one. All callers that wait get the result, which is not kept. One name occupies one
-/// thread, however many callers wait for it, and at most `MAX_NAME_LOOKUPS` names are looked up at a time.
+/// call joins it; otherwise this call starts one. All callers that wait get the result, which is not kept. One name
+/// occupies one thread, however many callers wait for it, and at most `MAX_NAME_LOOKUPS` names are looked up at a time.
 /// @param completion is called once, on a thread of the look-ups, which it must not block; it must not throw. It is not
 ///        called after the item is cancelled; a call that has begun by then continues.
 /// @return the handle to this caller's part. A look-up that no caller waits for any more continues, because the

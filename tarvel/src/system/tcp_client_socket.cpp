@@ -337,7 +337,7 @@ void TcpClientSocketImpl::AsyncWrite(const char *bytes, std::size_t length, Tran
   WriteSome(std::make_shared<PendingWrite>(PendingWrite{bytes, length, 0, std::move(handler)}));
 }
 
-// Under the lock.
+// Called under the lock.
 void TcpClientSocketImpl::WriteSome(const std::shared_ptr<PendingWrite> &pending) {
   const asio::const_buffer rest(pending->bytes + pending->written, pending->length - pending->written);
   m_socket.async_write_some(rest, [self = Ref(this), pending](const error_code &error, std::size_t count) {

@@ -8,9 +8,9 @@
 
 namespace Tarvel::Xml {
 
-/// Passes over a byte order mark and an XML declaration, both of which may be missing.
-/// @throws XMLParseException when the document is empty, too long, in an encoding other than UTF-8 or a version other
-///         than XML 1.0, or when its declaration is malformed.
+/// Skips a byte order mark and an XML declaration, both of which may be missing.
+/// @throws XMLParseException when the document is empty, too long, in an encoding other than UTF-8 or US-ASCII or a
+///         version other than XML 1.0, or when its declaration is malformed.
 void ReadDocumentBeginning(SourceCursor &cursor);
 
 } // namespace Tarvel::Xml

@@ -10,10 +10,10 @@
 
 namespace Tarvel::Xml {
 
-/// Reads a document in one pass and passes its events to `handler`, all except `StartDocument` and `TakeResult`. Never reads
-/// beyond the end of `source`. Takes time linear in the length of the document. If something in a text must be
-/// replaced, takes memory for one buffer, which is at most as long as the document.
-/// @param source outlives the call; texts in which nothing was replaced are passed to `handler` as views of it.
+/// Reads a document in one pass and calls the functions of `handler` except `StartDocument` and `TakeResult`. Never
+/// reads beyond the end of `source`. The time is linear in the length of the document. If something in a text must be
+/// replaced, allocates one buffer, which is at most as long as the document.
+/// @param source must be valid as long as the texts that `handler` keeps: those without replacements are views of it.
 /// @throws XMLParseException for the first error. What can only be checked as a whole (a name, a reference, a value, a tag)
 ///         is reported where it begins, everything else at the first byte that is not allowed. The length and the first four
 ///         bytes are checked before the rest.

@@ -84,7 +84,7 @@ inline const char *FindEscaped(const char *from, const char *end) noexcept {
   while (static_cast<std::size_t>(end - from) >= BLOCK_BYTES && !HasEscaped<SETS>(from)) {
     from += BLOCK_BYTES;
   }
-  // If enough bytes precede the remaining ones, these are checked as the end of one more block.
+  // If fewer bytes than a block remain of a text that is long enough, its last 16 bytes are checked as one more block.
   const bool isLastBlock = static_cast<std::size_t>(end - from) < BLOCK_BYTES;
   if (isLastBlock && static_cast<std::size_t>(end - begin) >= BLOCK_BYTES && !HasEscaped<SETS>(end - BLOCK_BYTES)) {
     return end;

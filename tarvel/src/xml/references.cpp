@@ -18,7 +18,8 @@ struct Entity {
   char character;
 };
 
-constexpr Entity ENTITIES[] = {{"amp", '&'}, {"lt", '<'}, {"gt", '>'}, {"quot", '"'}, {"apos", '\''}}; // section 4.6
+/// XML 1.0, section 4.6.
+constexpr Entity ENTITIES[] = {{"amp", '&'}, {"lt", '<'}, {"gt", '>'}, {"quot", '"'}, {"apos", '\''}};
 
 constexpr std::uint32_t NO_DIGIT = 16;
 

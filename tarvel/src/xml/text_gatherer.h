@@ -30,13 +30,14 @@ public:
     m_text = m_free;
   }
 
-  /// Replaces the source from `begin` to `end`, after all earlier replacements, by `by`, which is at most as long.
+  /// Replaces the source from `begin` to `end` by `by`, which is at most as long. All earlier replacements of the text
+  /// are before `begin`.
   void Replace(const char *begin, const char *end, std::string_view by) {
     Gather(begin, by);
     m_pieceBegin = end;
   }
 
-  /// Ends the text at `place` of the source. It is valid until the next `Clear`.
+  /// Ends the text at `place` of the source and returns it. The text is valid until the next `Clear`.
   std::string_view End(const char *place) {
     if (m_free == m_text) {
       return std::string_view(m_pieceBegin, static_cast<std::size_t>(place - m_pieceBegin));
@@ -66,7 +67,7 @@ private:
   void Append(std::string_view text) noexcept { m_free = std::copy(text.begin(), text.end(), m_free); }
 
   const char *m_sourceEnd;
-  const char *m_pieceBegin = nullptr; // where the part of the source begins that is not copied yet
+  const char *m_pieceBegin = nullptr; // the beginning of the part of the source that is not copied yet
   std::unique_ptr<char[]> m_buffer;
   char *m_free = nullptr; // the end of all texts
   char *m_text = nullptr; // the beginning of the current text

@@ -34,7 +34,7 @@ public:
   virtual std::string Where() const;
 
   /// A new copy of the same dynamic class. The caller owns it and deletes it; `Copy` returns an owner instead. It may
-  /// be handed to another thread.
+  /// be passed to another thread.
   virtual Exception *Clone() const;
 
   /// What `Clone` returns, with an owner that deletes it. Use this to keep an exception that is valid only during a
@@ -107,9 +107,10 @@ class TARVEL_API DateTimeFormatException : public Exception {
   TARVEL_EXCEPTION_BODY(DateTimeFormatException, Exception);
 };
 
-/// Memory ran out in OpenSSL, in any function that uses it, or after the start of an operation over HTTP or TLS, whose
-/// completion gets this exception. (Elsewhere a call throws `std::bad_alloc`.) It says nothing about the data that was
-/// being read, verified or sent. The message is always "There is not enough memory"; there is no call stack.
+/// Memory ran out in OpenSSL, or after an operation over HTTP or TLS was started. Any function that uses OpenSSL may
+/// throw this exception; the completion of the operation receives it. (Elsewhere a call throws `std::bad_alloc`.) It
+/// says nothing about the data that was being read, verified or sent. The message is always "There is not enough
+/// memory"; there is no call stack.
 class TARVEL_API OutOfMemoryException : public Exception {
 public:
   OutOfMemoryException() noexcept = default;
@@ -122,7 +123,7 @@ public:
   [[noreturn]] void Throw() const override;
 };
 
-/// A file or stream that cannot be read or written; the message names it and the system's reason.
+/// A file or stream that cannot be read or written; the message contains its name and the system's reason.
 class TARVEL_API IOException : public Exception {
   TARVEL_EXCEPTION_BODY(IOException, Exception);
 };

@@ -53,18 +53,18 @@ protected:
 using CertificateList = std::vector<Ref<const Certificate>>;
 
 /// Decodes the certificate in DER form that the `length` bytes at `data` contain.
-/// @throws CryptoException when it does not decode, or further bytes follow it.
+/// @throws CryptoException when it cannot be decoded, or further bytes follow it.
 TARVEL_API Ref<const Certificate> CreateCertificateFromDer(const std::uint8_t *data, std::size_t length);
 
 /// The first certificate in PEM text.
-/// @throws CryptoException when there is no certificate, or it does not decode.
+/// @throws CryptoException when there is no certificate, or it cannot be decoded.
 TARVEL_API Ref<const Certificate> CreateCertificateFromPem(std::string_view pem);
 
 /// All certificates of PEM text, in order: at least one.
-/// @throws CryptoException when there is no certificate, one does not decode, or the text contains a private key.
+/// @throws CryptoException when there is no certificate, one cannot be decoded, or the text contains a private key.
 TARVEL_API CertificateList CreateCertificatesFromPem(std::string_view pem);
 
-/// All certificates of a file: PEM, or one in DER.
+/// All certificates of a file, which contains PEM text or one certificate in DER form.
 /// @throws IOException when the file cannot be read.
 /// @throws CryptoException as `CreateCertificatesFromPem` does; the message begins with the path.
 TARVEL_API CertificateList LoadCertificates(const std::string &path);

@@ -28,8 +28,8 @@ public:
   /// What has been written so far; valid until the next write.
   virtual const std::string &GetText() const = 0;
 
-  /// Returns what has been written and starts again with an empty text. The caller owns the text, and overwrites it if
-  /// it is secret.
+  /// Returns what has been written and starts again with an empty text. The caller owns the text, and must overwrite it
+  /// if it is secret.
   virtual std::string TakeText() = 0;
 
 protected:

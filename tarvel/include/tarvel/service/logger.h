@@ -68,7 +68,7 @@ private:
   std::atomic<int> m_level;
 };
 
-/// Writes `message`, with the arguments in %1 to %9, as one line of `logger` if the logger's level is at least `level`.
+/// Writes `message` as one line of `logger` if the logger's level is at least `level`. The arguments replace %1 to %9.
 template <typename... Args>
 void LogInternal(Logger &logger, int level, std::string_view message, const Args &...args) {
   if (logger.GetLevel() < level) {

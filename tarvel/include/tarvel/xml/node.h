@@ -34,7 +34,7 @@ enum class CharacterForm : std::uint8_t {
   ///< references
 };
 
-/// The kind of a node, which says its class.
+/// The kind of a node. Each kind has its own class.
 enum class NodeKind : std::uint8_t { DOCUMENT, ELEMENT, TEXT, COMMENT, PROCESSING_INSTRUCTION };
 
 /// The base of all nodes. Nodes are made by the factories below and by the parser, never copied.
@@ -187,7 +187,7 @@ public:
   /// @return whether the prefix is bound; `uri` is written only then.
   bool LookupNamespace(std::string_view prefix, std::string_view &uri) const noexcept;
 
-  /// The element's own qualified name; an unbound prefix yields the empty namespace.
+  /// The element's own qualified name. Its namespace is empty if the prefix is not bound.
   QName GetQName() const;
 
   /// Whether the element has that local name and its prefix is bound to that namespace.
@@ -219,7 +219,7 @@ public:
   void DefineAttribute(std::string_view qualifiedName, std::string_view value);
 
   /// Makes `child` the last child. The child of a document, such as its document element, is removed from the document.
-  /// @throws InvalidArgumentException when `child` is null, a document, the element itself or above it.
+  /// @throws InvalidArgumentException when `child` is null, a document, the element itself or its ancestor.
   /// @throws InvalidStateException when `child` already is the child of an element.
   void AppendChild(Node *child);
 
@@ -234,7 +234,7 @@ public:
   void AppendText(std::string_view value);
 
   /// Writes the element and all nodes below it as UTF-8 XML, without an XML declaration. In either form, text, attribute
-  /// values and line ends are escaped so that parsing yields the same tree. An element without children is written as
+  /// values and line ends are escaped so that parsing makes the same tree. An element without children is written as
   /// "<name></name>".
   void WriteTo(Writer &writer, CharacterForm form = CharacterForm::UTF8) const;
 

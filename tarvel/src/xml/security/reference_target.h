@@ -26,7 +26,7 @@ std::vector<IdentifierSearch> PlanSearches(const std::vector<std::string_view> &
 /// The targets of `uris`, in their order, in the tree that contains `root`: "" is the document (or topmost element), "#x"
 /// the one element with an identifier x in an attribute ID, Id, wsu:Id or xml:id. So the identifier of `root` cannot
 /// refer to another element. The tree is walked once for all references.
-/// @throws XmlSecurityException when a URI is neither "" nor "#x", or not exactly one element has the identifier.
+/// @throws XmlSecurityException when a URI is neither "" nor "#x", or no element or more than one has the identifier.
 std::vector<const Node *> ResolveReferences(const ElementNode &root, const std::vector<std::string_view> &uris);
 
 } // namespace Tarvel::Xml::Security

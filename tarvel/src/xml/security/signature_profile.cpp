@@ -71,7 +71,7 @@ void RequireNoParameters(const AlgorithmSyntax &syntax) {
   }
 }
 
-/// The prefixes of a list separated by white space. They are counted while reading: a list of millions needs no memory.
+/// The prefixes of a list separated by white space. A list of too many is refused before all of them are stored.
 std::vector<std::string> RequirePrefixes(std::string_view list, std::string_view uri) {
   std::vector<std::string> prefixes;
   for (std::size_t begin = list.find_first_not_of(WHITE_SPACE); begin != std::string_view::npos;) {

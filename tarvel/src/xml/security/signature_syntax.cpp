@@ -34,7 +34,7 @@ bool IsWhiteSpace(std::string_view text) {
   return text.find_first_not_of(WHITE_SPACE) == std::string_view::npos;
 }
 
-/// Steps through the child elements of an element, which may contain nothing else but white space and comments.
+/// Steps through the child elements of an element. Apart from them it may contain only white space and comments.
 class ChildElements {
 public:
   explicit ChildElements(const ElementNode &parent) : m_parent(parent) { MoveTo(parent.GetFirstChild()); }
