@@ -48,7 +48,8 @@ public:
   /// Called with the number of bytes moved and null, or with the failure, which is valid during the call:
   /// - a `NetworkException` (also when memory runs out on the way); over TLS its subclass `Ssl::SSLException`;
   /// - an `InvalidArgumentException` or `InvalidStateException` for a read of no bytes and, over TLS, for a second read
-  ///   or write while one is pending, and for any before the handshake or on a connection of the parent process;
+  ///   or write while one is pending, and for a read or write before the handshake or on a connection of the parent
+  ///   process;
   /// - over TLS, an `InvalidStateException` when OpenSSL has cleaned itself up because the process ends (at once,
   ///   whatever the peer does), or an `OutOfMemoryException`; either ends the connection.
   using TransferHandler = std::function<void(std::size_t, const Exception *)>;
