@@ -92,7 +92,7 @@ void Start(const SsoClient::SecurityTokenService &service, const std::string &us
 bool Print(const Outcome &outcome) {
   try {
     if (outcome.failure) {
-      outcome.failure->Throw(); // as the class that it is
+      outcome.failure->Throw(); // in its own class
     }
     std::cout << outcome.user << ": " << outcome.token->GetId() << ", valid until "
               << outcome.token->GetEndDate().ToString() << '\n';

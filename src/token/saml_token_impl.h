@@ -12,7 +12,7 @@
 
 namespace SsoClient {
 
-/// A complete token: its constructors parse, check and verify, or throw as `CreateSamlToken` says. Make it by
+/// A complete token: its constructors parse, check and verify, or throw what `CreateSamlToken` throws. Make it by
 /// `std::make_shared<SamlTokenImpl>`. The shared pointer then calls the destructor of this class, although the
 /// interface has no virtual destructor.
 class SamlTokenImpl final : public SamlToken {

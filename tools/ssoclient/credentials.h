@@ -29,7 +29,7 @@ struct CredentialsOptions {
   GssOptions gss;
 };
 
-/// What it takes to acquire a token, for every kind of credentials.
+/// What is needed to acquire a token, for every kind of credentials.
 struct AcquireCall {
   const SecurityTokenService &service;
   const TokenSpec &spec;
@@ -43,7 +43,7 @@ struct AcquireCall {
 
 /// One row of the table of kinds.
 struct CredentialsKind {
-  const char *option; ///< the option that chooses the kind; null for the identity alone, which has no such option
+  const char *option; ///< the option that chooses the kind; null for the kind that needs only the identity
   bool (*isChosen)(const CredentialsOptions &credentials);
 
   /// @throws UsageException when the rest of the command line contradicts the kind.
@@ -58,7 +58,7 @@ void AddCredentialsOptions(CLI::App &app, CredentialsOptions &options);
 /// @throws UsageException when another option reads the same descriptor.
 void ClaimInput(const CredentialsOptions &options, InputClaims &claims);
 
-/// The kind that the command line chooses, or the identity alone when it chooses none.
+/// The kind that the command line chooses. If it chooses none, the kind that needs only the identity.
 /// @throws UsageException when it chooses several, or none and there is no identity.
 const CredentialsKind &ChooseCredentials(const CredentialsOptions &options, bool hasIdentity);
 

@@ -33,7 +33,7 @@ void AddIdentityOptions(CLI::App &app, IdentityOptions &options);
 /// @throws UsageException for a passphrase without a key, or when another option reads the same descriptor.
 void CheckIdentity(const IdentityOptions &options, InputClaims &claims);
 
-/// The identity; none when no option gives one. The passphrase is read only if the key needs it.
+/// The identity; `boost::none` when no option states one. The passphrase is read only if the key needs it.
 /// @throws Tarvel::IOException, Tarvel::Crypto::CryptoException, and what `ReadSecret` throws
 boost::optional<HolderOfKeyConfig> LoadIdentity(const IdentityOptions &options);
 

@@ -17,7 +17,7 @@ Action DefineInspect(CLI::App &app, const OutputOptions &output) {
   const auto file = std::make_shared<std::string>();
   AddTokenArgument(app, *file);
   return [file, &output] {
-    // One octet more than the parser accepts, so that the parser refuses what is too long.
+    // One octet more than the parser accepts, so that the parser refuses a token that is too long.
     WriteOutput(Render(InspectToken(ReadInput(*file, Tarvel::Xml::MAX_DOCUMENT_BYTES + 1)), output.format));
     return ExitCode::DONE;
   };

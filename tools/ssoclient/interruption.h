@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// How a signal ends the tool: at once, with the terminal as it was, and with no unfinished file left over.
+/// How a signal ends the tool: at once, with the terminal restored, and with no unfinished file left over.
 
 #pragma once
 
@@ -15,8 +15,8 @@ namespace SsoClient::Tool {
 /// it on the main thread, which handles all signals: the library's own threads block them.
 void CatchEndingSignals();
 
-/// Blocks, while it lives, the signals that end or stop the process; a signal that arrives takes effect afterwards. For
-/// short work that must not be left half done. Main thread only.
+/// While it lives, the signals that end or stop the process are blocked; a signal that arrives takes effect afterwards.
+/// It is for short work that must not be left half done, on the main thread only.
 class SignalsHeldBack {
 public:
   SignalsHeldBack() noexcept;
@@ -29,8 +29,8 @@ private:
 };
 
 /// While it lives, the terminal at a descriptor (if it is a terminal) does not echo what is typed, except the end of
-/// the line. The keyboard cannot stop the process, since the shell would then make the terminal echo again. At most one
-/// at a time; main thread only.
+/// the line. The keyboard cannot stop the process, since the shell would then make the terminal echo again. There is
+/// at most one at a time, on the main thread only.
 class QuietTerminal {
 public:
   explicit QuietTerminal(int descriptor) noexcept;

@@ -19,8 +19,8 @@ struct OutputOptions {
   bool verbose = false;
 };
 
-/// `text` with every character that could control a terminal or fake a line written as \uXXXX: control characters, line
-/// and paragraph separators, and characters that change the direction of text. `text` is UTF-8.
+/// Returns `text`, which is UTF-8, with \uXXXX in place of each character that could control a terminal or fake a line:
+/// control characters, line and paragraph separators, and characters that change the direction of text.
 std::string Printable(std::string_view text);
 
 /// The same, cut at the length of a value (`Tarvel::StringUtil::MAX_VALUE_BYTES`).
@@ -34,7 +34,7 @@ std::string ReadInput(const std::string &path, std::size_t limit);
 /// @throws Tarvel::IOException when it cannot be written in full.
 void WriteOutput(std::string_view text);
 
-/// Writes a warning to standard error, as one line. For warnings that no failure can follow.
+/// Writes a warning to standard error, as one line. Use it only for warnings that no failure can follow.
 void Warn(std::string_view message);
 
 /// The same for warnings that a failure may follow. When the format is JSON, only a verbose command writes them:

@@ -29,10 +29,11 @@ void AddTokenOutputOptions(CLI::App &app, TokenOutputOptions &options);
 /// @throws UsageException, Tarvel::IOException
 void CheckTokenOutput(const TokenOutputOptions &options, const OutputOptions &output);
 
-/// Warns of what `spec` asks for and the token does not have. Writes the token's XML where the options say, and shows
-/// on standard output what the token says, unless the format is XML or the XML is already there.
+/// Warns of what `spec` asks for and the token does not have. With a file, writes the token's XML to it, and then,
+/// unless the format is XML, the report to standard output. If the file is "-", writes only the XML to standard output;
+/// without a file, only the report.
 /// @param toleranceSec as for `FindUnmet`
-/// @throws Tarvel::IOException when the XML cannot be written.
+/// @throws Tarvel::IOException when the XML cannot be written, or, without a file, the report.
 void WriteToken(const IssuedToken &issued, const TokenSpec &spec, std::int64_t toleranceSec,
                 const TokenOutputOptions &options, const OutputOptions &output);
 

@@ -22,7 +22,7 @@ struct TokenReport {
   bool verified = false;
   TokenFacts facts;
   std::string xml;
-  /// What was asked for and is not in the token; none for a token that this command has not acquired.
+  /// What was asked for and is not in the token; `boost::none` for a token that the service has not just issued.
   boost::optional<std::vector<UnmetRequest>> unmet;
 };
 

@@ -39,12 +39,12 @@ void AddTokenSpecOptions(CLI::App &app, TokenSpecOptions &options);
 std::int64_t ParseLifetime(std::string_view text);
 
 /// The advice in texts of the form SOURCE:NAME=VALUE. NAME begins after the last colon before the first "="; a
-/// backslash makes the character after it an ordinary one. Values of one name, and names of one source, are put
-/// together in their order.
+/// backslash makes the character after it an ordinary one. Values of one name, and names of one source, are
+/// collected in their order.
 /// @throws UsageException for a text of another form.
 std::vector<Advice> ParseAdvice(const std::vector<std::string> &texts);
 
-/// @throws UsageException as above.
+/// @throws UsageException for a lifetime or an advice that `ParseLifetime` or `ParseAdvice` refuses.
 TokenSpec ToTokenSpec(const TokenSpecOptions &options);
 
 } // namespace SsoClient::Tool

@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// The certificates that a command trusts, and the tokens that it is given.
+/// The certificates that a command trusts, and the tokens that it reads.
 
 #pragma once
 

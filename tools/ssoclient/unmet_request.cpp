@@ -81,7 +81,7 @@ void CheckAudience(const TokenSpec &spec, const TokenFacts &facts, std::vector<U
   }
 }
 
-/// Whether the token is valid for as long as was asked for. A service may count from its own clock or from the
+/// Whether the token is valid for the requested lifetime. A service may count from its own clock or from the
 /// request's dates. So it is enough that the token ends late enough by this machine's clock, or that its own dates are
 /// far enough apart and the difference of the clocks explains the rest.
 bool LastsLongEnough(std::int64_t lifetimeSec, const Tarvel::System::DateTime &askedAt, const TokenFacts &facts,

@@ -18,8 +18,8 @@ namespace Tarvel {
 
 namespace {
 
-/// The most frames of a call stack that an exception keeps: exceptions are made far more often than their stacks are
-/// read.
+/// The maximum number of frames that an exception keeps of its call stack. It is small because exceptions are made far
+/// more often than their stacks are read.
 constexpr std::size_t MAX_FRAMES = 32;
 
 using Address = boost::stacktrace::frame::native_frame_ptr_t;

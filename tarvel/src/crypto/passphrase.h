@@ -22,7 +22,7 @@ public:
   Passphrase &operator=(const Passphrase &) = delete;
 
   /// The passphrase, valid as long as this object.
-  /// @throws WrongPassphraseException when there is no callback; whatever the callback throws; InvalidStateException when
+  /// @throws WrongPassphraseException when there is no callback; what the callback throws; InvalidStateException when
   ///         OpenSSL has cleaned itself up in the meantime.
   const std::string &Get();
 

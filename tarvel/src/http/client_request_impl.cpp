@@ -14,8 +14,8 @@ namespace Tarvel::Http {
 
 namespace {
 
-/// Headers that only the user agent sets. It never sends Transfer-Encoding or Expect. A second header of the same name
-/// would make the message ambiguous.
+/// Headers that a caller cannot set, because a second header of the same name would make the message ambiguous. The
+/// user agent sets them itself, except Transfer-Encoding and Expect, which it never sends.
 constexpr std::array<std::string_view, 7> OWN_HEADERS{
     "Accept-Encoding", "Connection", "Content-Length", "Cookie", "Host", "Transfer-Encoding", "Expect"};
 

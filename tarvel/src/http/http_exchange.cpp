@@ -123,7 +123,7 @@ void HttpExchange::OnConnected(const Ref<System::Stream> &stream, const Exceptio
       throw InvalidStateException("A connection specification reported neither a stream nor a failure");
     }
     Send(stream);
-    // At once: a server that refuses a request may answer, and end the connection, before it has read the request.
+    // Reads at once, because a server that refuses a request may answer and close before it has read the request.
     Read(stream);
   });
 }

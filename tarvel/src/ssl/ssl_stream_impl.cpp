@@ -122,8 +122,8 @@ void SSLStreamImpl::Close() noexcept {
   m_lower->Close();
 }
 
-/// Sends TLS's closing notice, unless a write is under way below. It is lost if the stream below does not accept it at
-/// once.
+/// Sends TLS's closing notice, unless a write is under way below. The notice is lost if the stream below does not
+/// accept it at once.
 void SSLStreamImpl::SendClosingNotice() noexcept {
   if (m_stage != Stage::ESTABLISHED || m_lowerWrites) {
     return;

@@ -23,7 +23,7 @@ struct Fraction {
   bool isZero; ///< whether every digit is 0, including those finer than a microsecond
 };
 
-/// Reads the text from left to right and refuses it at the first character that does not fit.
+/// Reads the text from left to right and refuses it at the first character that is not allowed.
 class Scanner {
 public:
   explicit Scanner(std::string_view text) noexcept : m_text(text) {}

@@ -40,7 +40,7 @@ class IoEngine final : public ForkListener {
 public:
   /// @throws boost::system::system_error when no descriptor is left.
   IoEngine() {
-    // Asio opens the descriptors that it waits on when the first socket and the first timer are made. They are made
+    // When the first socket and the first timer are made, Asio opens the descriptors that it waits on. Both are made
     // here, so that no later one fails for lack of descriptors.
     const boost::asio::ip::tcp::socket socket(m_context);
     const boost::asio::steady_timer timer(m_context);

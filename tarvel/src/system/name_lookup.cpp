@@ -65,8 +65,8 @@ void AppendAddress(AddressList &addresses, const sockaddr &socketAddress) {
   }
 }
 
-/// The system's error when no descriptor is left, else 0. In that case the resolver reports only an unknown name. It
-/// may have left the error in `errno`; otherwise this tries to open a descriptor.
+/// Returns the system's error if no descriptor is left, otherwise 0. Without descriptors, the resolver reports only an
+/// unknown name. It may have left the error in `errno`; if not, this function tries to open a descriptor.
 int FindLackOfDescriptors(int errorOfResolver) noexcept {
   if (errorOfResolver == EMFILE || errorOfResolver == ENFILE) {
     return errorOfResolver;

@@ -267,8 +267,8 @@ private:
     return state;
   }
 
-  /// Called under the pool's lock. Throws only when the pool has no thread at all, so that the item would wait for
-  /// ever.
+  /// Called under the pool's lock. Throws only when no thread can be started and the pool has none: the item would
+  /// wait for ever.
   static void StartThreadFor(WorkItem &item, const std::shared_ptr<PoolState> &state) {
     try {
       AddThread(state);

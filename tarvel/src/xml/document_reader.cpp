@@ -303,8 +303,8 @@ void DocumentReader::ReadCData() {
   m_gatherer.Replace(end, m_cursor.GetPlace(), "");
 }
 
-/// Passes over characters that are not markup, replacing line ends, and over the `delimiter` that ends them.
-/// @param atEnd the refusal if the document ends before it. @return where the delimiter begins.
+/// Skips characters that are not markup, and the `delimiter` that ends them. Replaces the line ends among them.
+/// @param atEnd the refusal if the document ends before the delimiter. @return where the delimiter begins.
 const char *DocumentReader::SkipUpTo(std::string_view delimiter, Refusal atEnd) {
   for (;;) {
     m_cursor.SkipPlain<PLAIN_IN_MARKUP>();

@@ -81,7 +81,7 @@ void NamespaceScope::CheckNames(const std::vector<AttributeEvent> &attributes) {
   }
 }
 
-// Of all forbidden pairs, the one whose second attribute comes first is reported.
+// If several pairs are forbidden, the pair whose second attribute comes first is reported.
 void NamespaceScope::CheckFewNames(const std::vector<AttributeEvent> &attributes) {
   constexpr std::size_t NOT_LOOKED_UP = UNKNOWN - 1;
   std::array<std::size_t, FEW_ATTRIBUTES> namespaces; // each is looked up at most once: there may be many declarations
@@ -114,7 +114,7 @@ void NamespaceScope::RefusePair(const AttributeEvent &first, const AttributeEven
 }
 
 // Sorting makes attributes with the same local name adjacent. Among these, a second sorting makes those of one
-// namespace adjacent. Of all forbidden pairs, the one whose second attribute comes first is reported.
+// namespace adjacent. If several pairs are forbidden, the pair whose second attribute comes first is reported.
 void NamespaceScope::CheckManyNames(const std::vector<AttributeEvent> &attributes) {
   SortByName(attributes);
   AttributePair firstPair{UNKNOWN, UNKNOWN};

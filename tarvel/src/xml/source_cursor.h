@@ -119,32 +119,31 @@ public:
     return std::string_view(begin, static_cast<std::size_t>(m_next - begin));
   }
 
-  /// Passes over that many bytes, none of which is a line feed.
+  /// Skips that many bytes, none of which is a line feed.
   void Advance(std::size_t bytes) noexcept { m_next += bytes; }
 
-  /// Passes over a line feed if one comes next.
+  /// Skips a line feed if one comes next.
   void SkipLineFeed() noexcept {
     if (IsAt('\n')) {
       BeginLine(++m_next);
     }
   }
 
-  /// Passes over `literal`, which has no line feed, if it comes next. @return whether it does.
+  /// Skips `literal`, which has no line feed, if it comes next. @return whether it does.
   bool Skip(std::string_view literal) noexcept {
     const bool isHere = IsAt(literal);
     m_next += isHere ? literal.size() : 0;
     return isHere;
   }
 
-  /// Passes over `literal` with `last` after it if both come next. @return whether they do.
+  /// Skips `literal` with `last` after it if both come next. @return whether they do.
   bool Skip(std::string_view literal, char last) noexcept {
     const bool isHere = GetRemaining() > literal.size() && m_next[literal.size()] == last && IsAt(literal);
     m_next += isHere ? literal.size() + 1 : 0;
     return isHere;
   }
 
-  /// Passes over the plain characters that come next, many at a time. Outside attribute values, it also passes over
-  /// line feeds.
+  /// Skips the plain characters that come next, many at a time. Outside attribute values, it also skips line feeds.
   template <CharacterClass PLAIN>
   void SkipPlain() noexcept {
     const char *next = m_next;
@@ -164,7 +163,7 @@ public:
     m_next = next;
   }
 
-  /// Passes over the white space that comes next. @return whether there was any.
+  /// Skips the white space that comes next. @return whether there was any.
   bool SkipSpace() noexcept {
     const char *const begin = m_next;
     while (m_next != m_end && IsOfClass(*m_next, SPACE)) {
@@ -175,8 +174,8 @@ public:
     return m_next != begin;
   }
 
-  /// Passes over one character, which need not be ASCII. Must not be called at the end.
-  /// @throws XMLParseException when it is not UTF-8, does not exist in the declared encoding, or cannot be carried by XML.
+  /// Skips one character, which need not be ASCII. Must not be called at the end.
+  /// @throws XMLParseException when it is not UTF-8, does not exist in the declared encoding, or is not allowed in XML.
   void SkipCharacter() {
     const unsigned char byte = static_cast<unsigned char>(*m_next);
     if (byte >= 0x20 && byte < 0x80) {
@@ -189,7 +188,7 @@ public:
   /// From here on only ASCII is accepted, because the document declares it.
   void RequireAscii() noexcept { m_isAscii = true; }
 
-  /// Passes over a name without a colon. @return whether one comes next.
+  /// Skips a name without a colon. @return whether one comes next.
   bool SkipNcName() {
     if (IsAtEnd() || !IsOfClass(*m_next, NAME_START)) {
       return SkipNameBeyondAscii();
@@ -198,12 +197,12 @@ public:
     return IsAtEnd() || static_cast<unsigned char>(*m_next) < 0x80 || SkipRestOfName();
   }
 
-  /// Passes over a name with at most one colon, which is between two names. @return an empty name when none comes next.
+  /// Skips a name with at most one colon, which is between two names. @return an empty name when none comes next.
   /// @param atEnd the refusal if the document ends after the colon.
   /// @throws XMLParseException when it has other colons or is too long.
   WrittenName ReadName(Refusal atEnd);
 
-  /// Passes over `INSTRUCTION_BEGIN`, which comes next, and the target of the processing instruction. @return the target.
+  /// Skips `INSTRUCTION_BEGIN`, which comes next, and the target of the processing instruction. @return the target.
   /// @throws XMLParseException when it is missing, too long, has a colon or is "xml" in any letter case.
   std::string_view ReadTarget();
 
@@ -239,7 +238,7 @@ private:
     m_lineBegin = place;
   }
 
-  /// Passes over the characters of a name that are ASCII.
+  /// Skips the characters of a name that are ASCII.
   void SkipNameCharacters() noexcept {
     const char *next = m_next;
     while (m_end - next >= 4 && IsOfClass(next[0], NAME) && IsOfClass(next[1], NAME) && IsOfClass(next[2], NAME) &&

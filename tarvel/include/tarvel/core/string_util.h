@@ -27,7 +27,7 @@ public:
   /// The lower-case form, by the same rules.
   static std::string ToLower(std::string_view text);
 
-  /// The most bytes of a value that a message contains.
+  /// The maximum length of a value in a message, in bytes.
   static constexpr std::size_t MAX_VALUE_BYTES = 1024;
 
   /// The maximum length of a line in a log or on a terminal, in bytes.

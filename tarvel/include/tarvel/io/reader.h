@@ -12,7 +12,7 @@
 
 namespace Tarvel {
 
-/// A stream of bytes with one position. For one thread at a time. A reader owns its bytes.
+/// A stream of bytes with one position. One thread at a time may use it. A reader owns its bytes.
 class TARVEL_API Reader : public Object {
 public:
   /// Reads up to `length` bytes into `buffer` and returns how many; 0 means the end.
@@ -25,7 +25,7 @@ public:
   virtual std::string ReadToEnd(std::size_t maximumBytes);
 
   /// The charset that the source declares for its bytes, in its own spelling ("windows-1252"); empty when it declares
-  /// none. For messages only: text that the reader can convert to UTF-8 has been converted already.
+  /// none. It is for messages only, because text that the reader can convert to UTF-8 has been converted already.
   virtual std::string GetDeclaredCharset() const;
 
 protected:

@@ -48,7 +48,8 @@ public:
   /// Called with the number of bytes moved and null, or with the failure, which is valid during the call:
   /// - a `NetworkException` (also when memory runs out on the way); over TLS its subclass `Ssl::SSLException`;
   /// - an `InvalidArgumentException` or `InvalidStateException` for a read of no bytes and, over TLS, for a second read
-  ///   or write while one is pending, for one before the handshake, and for one on a connection of the parent process;
+  ///   or write while one is pending, and for a read or write before the handshake or on a connection of the parent
+  ///   process;
   /// - over TLS, an `InvalidStateException` when OpenSSL has cleaned itself up because the process ends (at once,
   ///   whatever the peer does), or an `OutOfMemoryException`; either ends the connection.
   using TransferHandler = std::function<void(std::size_t, const Exception *)>;
@@ -65,9 +66,9 @@ public:
 
   /// Whether what is written is encrypted and the peer is verified before anything is sent. The result is the same at
   /// any time and on any thread. It is false unless a class overrides this, such as `Ssl::SSLStream`. A stream that
-  /// only passes bytes on to another one, for example to count them, returns the other one's result. What depends on
-  /// it: `Http::UserAgent` sends cookies with the attribute Secure only over a secure stream, and assumes the default
-  /// port 443 there.
+  /// only passes bytes on to another one, for example to count them, returns the other one's result.
+  /// `Http::UserAgent` depends on the result: it sends cookies with the attribute Secure only over a secure stream, and
+  /// assumes the default port 443 there.
   virtual bool IsSecure() const noexcept { return false; }
 
 protected:

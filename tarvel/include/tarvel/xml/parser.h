@@ -48,7 +48,7 @@ constexpr std::size_t MAX_NAME_BYTES = 4096;                  ///< of an element
 /// Receives a document as it is parsed. The library has one handler, the document handler.
 class XMLHandler;
 
-/// A parser bound to one handler. For one thread at a time.
+/// A parser bound to one handler. One thread at a time may use it.
 class TARVEL_API XMLParser : public Object {
 public:
   /// Reads `reader` to its end and returns what the handler made of the document.

@@ -12,7 +12,7 @@
 
 namespace Tarvel::Xml::Security {
 
-/// A buffer in front of a `Writer`. For one thread.
+/// A buffer in front of a `Writer`. One thread at a time may use it.
 class CanonicalOutput {
 public:
   explicit CanonicalOutput(Writer &writer) noexcept : m_writer(writer) {}

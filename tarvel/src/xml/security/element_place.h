@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// The position of an element, in the form that ends a message.
+/// The position of an element, as text for the end of a message.
 
 #pragma once
 

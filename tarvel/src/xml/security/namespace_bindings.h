@@ -14,7 +14,8 @@
 namespace Tarvel::Xml::Security {
 
 /// A stack of prefix bindings with constant-time look-up. The empty prefix means the default namespace. Before anything
-/// is declared, it is bound to the empty name, and "xml" to its fixed name. The caller owns the texts. For one thread.
+/// is declared, it is bound to the empty name, and "xml" to its fixed name. The caller owns the texts. One thread at a
+/// time may use it.
 class NamespaceBindings {
 public:
   struct Binding {

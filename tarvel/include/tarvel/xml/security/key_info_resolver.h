@@ -13,7 +13,7 @@
 
 namespace Tarvel::Xml::Security {
 
-/// Returns the certificates with whose keys a signature is checked. Immutable; safe on any thread.
+/// Chooses the certificates that a signature is checked with. Immutable; safe on any thread.
 class TARVEL_API KeyInfoResolver : public Object {
 public:
   /// The candidates, in order.
