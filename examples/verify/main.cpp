@@ -48,7 +48,8 @@ bool IsMember(const SsoClient::SamlToken &token, const SsoClient::PrincipalId &g
 }
 
 /// Why the caller is refused; empty when the caller is admitted.
-std::string Judge(const SsoClient::SamlToken &token, const std::string &audience, const SsoClient::PrincipalId &group) {
+std::string FindRefusal(const SsoClient::SamlToken &token, const std::string &audience,
+                        const SsoClient::PrincipalId &group) {
   if (!IsForUs(token, audience)) {
     return "the token is not for " + audience;
   }
@@ -82,7 +83,7 @@ int main(int argc, char **argv) {
   try {
     // A service does this for each request, on any number of threads at once.
     const std::shared_ptr<const SsoClient::SamlToken> token = SsoClient::CreateSamlToken(xml, trusted);
-    const std::string refusal = Judge(*token, argv[2], ParsePrincipal(argv[3]));
+    const std::string refusal = FindRefusal(*token, argv[2], ParsePrincipal(argv[3]));
     if (!refusal.empty()) {
       std::cerr << "refused: " << refusal << '\n';
       return REFUSED;

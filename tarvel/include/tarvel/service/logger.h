@@ -57,7 +57,8 @@ public:
   /// Sets the highest level that is written; other threads see the change soon.
   void SetLevel(int level) noexcept { m_level.store(level, std::memory_order_relaxed); }
 
-  /// Writes one line, whatever its level; callers test `GetLevel` first. Never throws.
+  /// Writes one line, whatever its level; callers test `GetLevel` first. A line of more than 7,168 bytes is cut, which its end
+  /// reports. Never throws.
   virtual void Write(int level, std::string_view message) noexcept = 0;
 
 protected:

@@ -28,8 +28,9 @@ class TARVEL_API Canonicalizer : public Object {
 public:
   /// Writes the canonical form of the subtree at `node`, in the context of its document; for a document node, of the whole
   /// document. `writer` receives it in pieces.
-  /// @throws XmlSecurityException when the tree has no canonical form: an unbound prefix, or a relative namespace name.
-  ///         What was written before must then be discarded.
+  /// @throws XmlSecurityException when the tree has no canonical form: an unbound prefix, a prefix bound to the empty name, a
+  ///         relative namespace name, a forbidden binding of "xml" or "xmlns", or an attribute that occurs twice; and when the
+  ///         tree exceeds the platform's limits. Discard what was written before.
   virtual void Canonicalize(const Node &node, Writer &writer) const = 0;
 
 protected:
