@@ -18,8 +18,8 @@
 namespace Tarvel::Xml {
 
 /// A document that is not well-formed (XML 1.0, Namespaces in XML 1.0), or that has something this library refuses: a
-/// document type declaration, an XML version other than 1.0, an encoding other than UTF-8 or its subset US-ASCII, or more than the limits below.
-/// The message ends in " at line L, column C".
+/// document type declaration, an XML version other than 1.0, an encoding other than UTF-8 or its subset US-ASCII, or more
+/// than the limits below. The message ends in " at line L, column C".
 class TARVEL_API XMLParseException : public Exception {
 public:
   /// An exception with the message `detail`, followed by the position.
