@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 
-#include "integration/password_wiping/freed_memory.h"
+#include "integration/secret_wiping/freed_memory.h"
 
 #include <malloc.h>
 

@@ -3,7 +3,7 @@
 #include "compose/ws_security.h"
 #include "exchange/request_builder_impl.h"
 #include "exchange/soap_response.h"
-#include "integration/password_wiping/freed_memory.h"
+#include "integration/secret_wiping/freed_memory.h"
 #include "integration/transport/service_stand_in.h"
 #include "support/identity.h"
 #include "support/rendezvous.h"
