@@ -18,7 +18,8 @@ struct HostileShape {
   std::function<std::string(std::size_t octets)> make;
 };
 
-/// All shapes: first complete documents, then genuine tokens with hostile content inserted.
+/// All shapes: first complete documents, then genuine tokens with hostile content inserted, then both with as many nodes
+/// as the limit allows.
 /// @param token the text of a genuine token, of the form of tests/data/tokens/bearer.xml
 std::vector<HostileShape> MakeHostileShapes(const std::string &token);
 
