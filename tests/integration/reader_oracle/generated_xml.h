@@ -9,7 +9,7 @@
 
 namespace Testing {
 
-/// The same text for the same seed on every machine; at most a few KiB, mostly much less.
+/// The same text for the same seed with the same compiler; at most a few KiB, mostly much less.
 std::string GenerateXml(std::uint64_t seed);
 
 } // namespace Testing
