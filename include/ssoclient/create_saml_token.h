@@ -6,6 +6,7 @@
 
 #include <ssoclient/export.h>
 #include <ssoclient/saml_token.h>
+#include <ssoclient/verify_options.h>
 #include <tarvel/crypto/certificate.h>
 #include <tarvel/xml/node.h>
 
@@ -14,9 +15,6 @@
 #include <string>
 
 namespace SsoClient {
-
-/// The clock tolerance of the factories that have no parameter for it, in seconds.
-constexpr std::int64_t DEFAULT_CLOCK_TOLERANCE_SEC = 600;
 
 /// Parses, checks and verifies the SAML 2.0 assertion in `xml`. The token's `ToXml` is `xml`, byte for byte.
 /// @param trustedCertificates the certificates whose keys may have signed the token. The key is what is trusted: the

@@ -7,6 +7,7 @@
 #include <ssoclient/export.h>
 #include <ssoclient/saml_token.h>
 #include <ssoclient/security_token_service_config.h>
+#include <ssoclient/service_options.h>
 #include <ssoclient/token_spec.h>
 
 #include <cstdint>
@@ -49,5 +50,10 @@ protected:
 /// @throws Tarvel::Http::MalformedURLException for a malformed address.
 SSOCLIENT_API std::shared_ptr<GssNegotiationContext>
 CreateGssNegotiationContext(const SecurityTokenServiceConfig &config, const TokenSpec &spec);
+
+/// The same with options, which are copied. Each call of `NegotiateToken` is one operation for the observer.
+SSOCLIENT_API std::shared_ptr<GssNegotiationContext>
+CreateGssNegotiationContext(const SecurityTokenServiceConfig &config, const TokenSpec &spec,
+                            const ServiceOptions &options);
 
 } // namespace SsoClient::InternalApi

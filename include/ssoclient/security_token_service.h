@@ -8,6 +8,7 @@
 #include <ssoclient/negotiation_handler.h>
 #include <ssoclient/saml_token.h>
 #include <ssoclient/security_token_service_config.h>
+#include <ssoclient/service_options.h>
 #include <ssoclient/token_spec.h>
 #include <tarvel/core/exception.h>
 
@@ -146,5 +147,14 @@ protected:
 /// @throws Tarvel::Http::MalformedURLException for a malformed address.
 SSOCLIENT_API std::shared_ptr<SecurityTokenService>
 CreateSecurityTokenService(const SecurityTokenServiceConfig &config);
+
+/// The same with options, which are copied.
+SSOCLIENT_API std::shared_ptr<SecurityTokenService> CreateSecurityTokenService(const SecurityTokenServiceConfig &config,
+                                                                               const ServiceOptions &options);
+
+/// The same with an observer only; null for none.
+SSOCLIENT_API std::shared_ptr<SecurityTokenService>
+CreateSecurityTokenService(const SecurityTokenServiceConfig &config,
+                           const std::shared_ptr<OperationObserver> &observer);
 
 } // namespace SsoClient

@@ -16,9 +16,14 @@
 #include <ssoclient/holder_of_key_config.h>
 #include <ssoclient/logger.h>
 #include <ssoclient/negotiation_handler.h>
+#include <ssoclient/operation_observer.h>
 #include <ssoclient/principal_id.h>
 #include <ssoclient/saml_token.h>
 #include <ssoclient/security_token_service.h>
 #include <ssoclient/security_token_service_config.h>
+#include <ssoclient/service_options.h>
+#include <ssoclient/token_report.h>
 #include <ssoclient/token_spec.h>
+#include <ssoclient/token_verifier.h>
+#include <ssoclient/verify_options.h>
 #include <ssoclient/version.h>

@@ -19,11 +19,8 @@ struct OutputOptions {
   bool verbose = false;
 };
 
-/// Returns `text`, which is UTF-8, with \uXXXX in place of each character that could control a terminal or fake a line:
-/// control characters, line and paragraph separators, and characters that change the direction of text.
-std::string Printable(std::string_view text);
-
-/// The same, cut at the length of a value (`Tarvel::StringUtil::MAX_VALUE_BYTES`).
+/// `text` in printable form (`Tarvel::StringUtil::Printable`), cut at the length of a value
+/// (`Tarvel::StringUtil::MAX_VALUE_BYTES`).
 std::string PrintableValue(std::string_view text);
 
 /// The octets of the file `path`, or of standard input when it is "-", at most `limit` of them.

@@ -7,6 +7,7 @@
 #include "output.h"
 
 #include <tarvel/core/exception.h>
+#include <tarvel/core/string_util.h>
 
 #include <cerrno>
 #include <cstddef>
@@ -56,7 +57,7 @@ Tarvel::SecretText ReadLine(int descriptor, const std::string &place, const std:
 }
 
 void Prompt(int terminal, const std::string &text) {
-  const std::string printable = Printable(text);
+  const std::string printable = Tarvel::StringUtil::Printable(text);
   // A terminal that cannot be written to can still be read.
   [[maybe_unused]] const ssize_t written = write(terminal, printable.data(), printable.size());
 }

@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// Letter case, shortening for messages, Base64 and UUID texts.
+/// Letter case, printable and shortened texts for messages, Base64 and UUID texts.
 
 #pragma once
 
@@ -36,6 +36,11 @@ public:
   /// `text` in the form for messages: all of it when it has at most `most` bytes; otherwise its first `most` bytes, or
   /// up to three fewer so that no UTF-8 character is split, then "... (N more bytes)".
   static std::string Shorten(std::string_view text, std::size_t most = MAX_VALUE_BYTES);
+
+  /// `text`, which is UTF-8, with \\uXXXX in place of each character that could control a terminal or fake a line:
+  /// control characters, line and paragraph separators, and characters that change the direction of text. An octet that is
+  /// not part of a UTF-8 sequence stays as it is.
+  static std::string Printable(std::string_view text);
 
   /// A new random UUID (RFC 4122, version 4) as 36 lower-case characters, from the system's random source, or from the
   /// source of a `ScopedEnvironment`.

@@ -48,6 +48,7 @@ public:
   void SetKeyInfo(const Ref<ElementNode> &content) override;
   void Sign(const Crypto::PrivateKey &key) override;
   Ref<ElementNode> GetElement() const override;
+  SignatureReport Explain(const KeyInfoResolver &resolver) const override;
 
 private:
   struct DigestMethod {
@@ -78,6 +79,13 @@ bool BlankSignature::Verify(const KeyInfoResolver &resolver, std::set<std::strin
   Ref<Signature> parsed;
   CreateSignatureFromDom(*m_root, *m_element, parsed);
   return parsed->Verify(resolver, signedUris);
+}
+
+SignatureReport BlankSignature::Explain(const KeyInfoResolver &resolver) const {
+  RequireSigned();
+  Ref<Signature> parsed;
+  CreateSignatureFromDom(*m_root, *m_element, parsed);
+  return parsed->Explain(resolver);
 }
 
 void BlankSignature::AddReference(std::string_view uri, std::string_view digestUri, std::string_view transformUri) {

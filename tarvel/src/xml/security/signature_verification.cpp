@@ -60,6 +60,7 @@ public:
   void SetKeyInfo(const Ref<ElementNode> &) override { RefuseChange(); }
   void Sign(const Crypto::PrivateKey &) override { RefuseChange(); }
   Ref<ElementNode> GetElement() const override { RefuseChange(); }
+  SignatureReport Explain(const KeyInfoResolver &resolver) const override;
 
 private:
   [[noreturn]] static void RefuseChange() {
@@ -169,6 +170,10 @@ bool ParsedSignature::SignatureMatches(const SignaturePlan &plan, const Crypto::
     }
   }
   return false;
+}
+
+SignatureReport ParsedSignature::Explain(const KeyInfoResolver &) const {
+  return {};
 }
 
 } // namespace

@@ -10,6 +10,7 @@
 #include <tarvel/xml/node.h>
 #include <tarvel/xml/security/exceptions.h>
 #include <tarvel/xml/security/key_info_resolver.h>
+#include <tarvel/xml/security/signature_report.h>
 
 #include <set>
 #include <string>
@@ -77,6 +78,12 @@ public:
   /// The `ds:Signature` element that `Sign` made.
   /// @throws InvalidStateException before `Sign`, and for a signature read from a tree.
   virtual Ref<ElementNode> GetElement() const = 0;
+
+  /// Checks what `Verify` checks, by the same rules, but goes on after a failure and reports everything. It computes the digests
+  /// of at most ten references even if no trusted key made the signature, so use it where a person waits for the answer.
+  /// @throws OutOfMemoryException, and InvalidStateException when OpenSSL has cleaned itself up, like `Verify`; also
+  ///         InvalidStateException for a blank signature before `Sign`. No content of the tree makes it throw.
+  virtual SignatureReport Explain(const KeyInfoResolver &resolver) const = 0;
 
 protected:
   ~Signature() override;

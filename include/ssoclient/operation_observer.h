@@ -1,0 +1,88 @@
+// SPDX-License-Identifier: Apache-2.0
+/// @file
+/// `OperationObserver`, through which a program follows the operations of a service: for metrics, traces and messages.
+
+#pragma once
+
+#include <ssoclient/export.h>
+
+#include <cstddef>
+#include <cstdint>
+#include <string>
+
+namespace SsoClient {
+
+/// Which operation an event belongs to.
+struct OperationInfo {
+  std::string id;   ///< a UUID, the same as "opId" in the log, so the events of one operation can be joined
+  std::string name; ///< the function, such as "AcquireToken"; "NegotiateToken" for a leg of a negotiation context
+};
+
+/// A request is about to be sent.
+struct RequestSentEvent {
+  std::string action;            ///< the value of the SOAPAction header
+  std::size_t requestOctets = 0; ///< of the body
+  int leg = 0;                   ///< of a negotiation, from 1; 0 for other operations
+};
+
+/// A response has been received, or the exchange failed.
+struct ResponseReceivedEvent {
+  int status = 0;                        ///< the HTTP status; 0 if there was no response
+  std::string reason;                    ///< the reason phrase; or, without a response, why there is none
+  std::string contentType;               ///< the header's value; empty without a response
+  std::size_t responseOctets = 0;        ///< of the body
+  std::int64_t durationMicroseconds = 0; ///< since the request was sent
+  int leg = 0;                           ///< as in `RequestSentEvent`
+};
+
+/// The service answered with a SOAP fault. Each text is cut at `Tarvel::StringUtil::MAX_VALUE_BYTES`, has "***" in the place of
+/// secrets, and is printable (`Tarvel::StringUtil::Printable`).
+struct FaultEvent {
+  std::string codeNamespace; ///< of the fault code; empty if its prefix is not bound
+  std::string codeName;      ///< the local name of the fault code
+  std::string code;          ///< the fault code as the service wrote it
+  std::string text;          ///< the `faultstring`
+  std::string detail;        ///< the text in the `detail` element, without that of tokens and signatures
+};
+
+/// The operation has ended.
+struct OperationEndedEvent {
+  /// The kinds of outcome.
+  enum class Outcome : std::int32_t { SUCCEEDED = 0, FAILED };
+
+  Outcome outcome = Outcome::SUCCEEDED;
+  std::string exceptionClass; ///< the unqualified name of the failure's class; empty if the operation succeeded
+  std::string message; ///< the failure's text, cut and masked as in `FaultEvent`; empty if the operation succeeded
+  std::int64_t durationMicroseconds = 0; ///< since the operation started
+};
+
+/// Implemented by the caller, and called on the thread that runs the operation. Operations run on several threads at once, so the
+/// functions must be safe on any thread. They must not block, since the operation waits for them, and must not throw: what they throw
+/// is written to the log (logger "SsoClient") and changes nothing else.
+///
+/// The events of one operation come in this order: started; for each message request sent, response received, and a fault if the
+/// response is one; ended. "Ended" comes exactly once for each "started", also after a failure.
+///
+/// No event contains a secret: no password, no text of a token, no value of a signature. If the service repeats the operation's
+/// password in a fault, "***" is in its place. Names of persons may occur in the texts of a service.
+class SSOCLIENT_API OperationObserver {
+public:
+  /// An operation has started. Nothing is composed or sent yet.
+  virtual void OnStarted(const OperationInfo &operation);
+  /// A request is about to be sent.
+  virtual void OnRequestSent(const OperationInfo &operation, const RequestSentEvent &event);
+  /// A response has been received, or the exchange failed.
+  virtual void OnResponseReceived(const OperationInfo &operation, const ResponseReceivedEvent &event);
+  /// The response is a fault.
+  virtual void OnFault(const OperationInfo &operation, const FaultEvent &event);
+  /// The operation has ended.
+  virtual void OnEnded(const OperationInfo &operation, const OperationEndedEvent &event);
+
+protected:
+  OperationObserver() = default;
+  OperationObserver(const OperationObserver &) = default;
+  OperationObserver &operator=(const OperationObserver &) = default;
+  ~OperationObserver() = default;
+};
+
+} // namespace SsoClient

@@ -1,0 +1,173 @@
+// SPDX-License-Identifier: Apache-2.0
+/// @file
+/// `TokenReport`, what each check of a token looked at, wanted and found.
+
+#pragma once
+
+#include <ssoclient/advice.h>
+#include <ssoclient/delegate.h>
+#include <ssoclient/export.h>
+#include <ssoclient/principal_id.h>
+#include <ssoclient/saml_token.h>
+#include <tarvel/crypto/certificate.h>
+#include <tarvel/system/date_time.h>
+
+#include <boost/optional.hpp>
+
+#include <cstddef>
+#include <cstdint>
+#include <set>
+#include <string>
+#include <utility>
+#include <vector>
+
+namespace SsoClient {
+
+/// What an assertion says about itself. **Nothing of this is verified, even if the report says that the token is accepted**:
+/// use `TokenVerifier::Verify` to get a token. An empty optional means that the text does not say it, or not in a form that
+/// can be read. Texts are as the sender wrote them, so they may contain control characters.
+struct UnverifiedClaims {
+  bool isAssertion = false; ///< whether the text contains an assertion; if not, nothing else is set
+  boost::optional<std::string> id;
+  boost::optional<std::string> issuer;
+  boost::optional<Tarvel::System::DateTime> issueInstant;
+  boost::optional<std::string> nameId;       ///< the subject's identifier as written
+  boost::optional<std::string> nameIdFormat; ///< the `Format` of the subject's identifier
+  boost::optional<PrincipalId> subject;      ///< set if the identifier is a user principal name
+  boost::optional<SamlToken::ConfirmationType> confirmation;
+  boost::optional<std::string> confirmationMethod; ///< as written; set for methods that are not known, too
+  boost::optional<Tarvel::System::DateTime> startDate;
+  boost::optional<Tarvel::System::DateTime> endDate;
+  boost::optional<bool> renewable;
+  boost::optional<bool> delegable;
+  boost::optional<bool> solution;
+  boost::optional<std::pair<std::string, std::string>> fullName; ///< first name and last name
+  std::vector<PrincipalId> groups;                               ///< those that can be read
+  std::vector<Delegate> delegationChain;                         ///< those that can be read
+  std::set<std::string> audience;
+  std::vector<Advice> advice;
+  /// Of a holder-of-key token: the subject and the SHA-256 thumbprint of the certificate, as texts. They are empty for
+  /// other tokens.
+  std::string certificateSubject;
+  std::string certificateThumbprint;
+};
+
+/// Why a token is accepted or refused: each check of the verification with its outcome. A check is reported also when an
+/// earlier one has failed.
+///
+/// All texts except `refusal` and `claims` are printable: characters that could control a terminal are written as \\uXXXX
+/// (`Tarvel::StringUtil::Printable`), and a text is cut at `Tarvel::StringUtil::MAX_VALUE_BYTES`. A report holds no secret and no
+/// token, but names of persons and groups. It refers to nothing outside itself, except to the trusted certificates.
+struct TokenReport {
+  /// The checks, in the order of the verification.
+  enum class Check : std::int32_t {
+    WELL_FORMED = 0, ///< the text is a well-formed XML document within the limits
+    FORM,            ///< elements, attributes and values are those of the profile, and the signature covers the token
+    IDENTIFIERS,     ///< version and identifier
+    VALIDITY,        ///< this machine's clock is within the time of validity
+    CONFIRMATION,    ///< the confirmation lasts as long as the token
+    DELEGATION,      ///< the delegate of the confirmation is the last delegate of the restriction
+    ALGORITHMS,      ///< the signature uses only accepted algorithms, transforms and parts
+    KEYS,            ///< a trusted key can be used with the signature's algorithm
+    REFERENCES,      ///< each reference resolves to exactly one node, and envelops the signature if it says so
+    SIGNATURE,       ///< a trusted key made the signature
+    DIGESTS,         ///< the digest of each reference is the one that was signed
+    NAMES,           ///< subject, groups, delegates and attributes can be read
+    AUDIENCE,        ///< the token is for an accepted audience; passed if `VerifyOptions` accept every audience
+    REQUIRED_CONFIRMATION ///< the token has the confirmation that `VerifyOptions` require, if they require one
+  };
+
+  /// The outcome of a check.
+  enum class Outcome : std::int32_t {
+    PASSED = 0,
+    FAILED,  ///< there is at least one finding
+    NOT_DONE ///< what the check needs is not there, because an earlier check failed; `summary` says what is missing
+  };
+
+  /// One thing for which a token is refused.
+  struct Finding {
+    std::string message;      ///< the text of the exception with which `Verify` would refuse it
+    std::string element;      ///< the name of the element as written; empty if the finding has no place
+    std::string attribute;    ///< the name of the attribute; empty if the finding is about the element
+    std::string path;         ///< from the document element to the element, such as "/saml2:Assertion/saml2:Subject"
+    std::uint32_t line = 0;   ///< of the element's start tag, or of the error in the text; from 1; 0: unknown
+    std::uint32_t column = 0; ///< from 1, in bytes; 0: unknown
+    std::string wanted;       ///< what is allowed or expected there; may be empty
+    std::string found;        ///< what is there; may be empty
+    std::int64_t missedBySec =
+        0;              ///< of a time: by how many seconds this machine's clock misses it, after the tolerance
+    std::string remedy; ///< what the reader can do about it; may be empty
+  };
+
+  /// One check.
+  struct CheckResult {
+    Check check = Check::WELL_FORMED;
+    Outcome outcome = Outcome::NOT_DONE;
+    std::string summary;              ///< what was looked at and found, in one sentence
+    std::vector<Finding> findings;    ///< in the order in which the verification meets them; empty unless FAILED
+    std::size_t unlistedFindings = 0; ///< further findings that are left out because of `MAX_FINDINGS`
+  };
+
+  /// One reference of the signature.
+  struct Reference {
+    std::string uri;
+    bool resolves = false;               ///< to exactly one element, or to the document
+    bool coversToken = false;            ///< its target is the assertion or the document that contains it
+    std::string target;                  ///< the name of the target element; "document" for the whole document
+    std::vector<std::string> transforms; ///< their algorithms, in order
+    std::string digestMethod;
+    std::string digestWanted;   ///< as the signature has it, in Base64
+    std::string digestComputed; ///< in Base64; empty if it cannot be computed
+    bool digestMatches = false;
+  };
+
+  /// One trusted key.
+  struct TrustedKey {
+    Tarvel::Ref<const Tarvel::Crypto::Certificate> certificate; ///< never null; one of those that the verifier trusts
+    std::string subject;
+    std::string thumbprint;     ///< SHA-256, as `Certificate::GetSha256Thumbprint`
+    bool isNamed = false;       ///< the signature's `KeyInfo` contains this certificate
+    bool isUsable = false;      ///< it can be used with the signature's algorithm
+    bool madeSignature = false; ///< it made the signature
+  };
+
+  /// A certificate in the signature's `KeyInfo`. It is shown only; it never becomes a key.
+  struct NamedCertificate {
+    std::string subject;    ///< empty if it cannot be read
+    std::string thumbprint; ///< SHA-256; empty if it cannot be read
+    bool isTrusted = false; ///< it is one of the trusted certificates; otherwise it is a stranger's
+  };
+
+  /// The maximum number of findings in a report. Further ones are only counted.
+  static constexpr std::size_t MAX_FINDINGS = 1000;
+
+  bool accepted = false; ///< whether `Verify` would return a token; exactly when no check has failed or was not done
+  /// The text of the exception that `Verify` throws, exactly, so it may contain control characters; empty if accepted.
+  std::string refusal;
+  std::vector<CheckResult> checks;                 ///< all checks, in order
+  std::string signatureAlgorithm;                  ///< its URI; empty if there is no signature that can be read
+  std::string canonicalization;                    ///< the algorithm of `SignedInfo`; empty as above
+  std::vector<Reference> references;               ///< at most ten
+  std::vector<TrustedKey> trustedKeys;             ///< in the order in which they are trusted
+  std::vector<NamedCertificate> namedCertificates; ///< at most 16
+  Tarvel::System::DateTime checkedAt;              ///< this machine's clock when the times were checked
+  UnverifiedClaims claims;
+
+  /// The result of `check`. Never null in a report that `TokenVerifier::Explain` returned.
+  SSOCLIENT_API const CheckResult &Get(Check check) const;
+
+  /// The first check that failed, or null.
+  SSOCLIENT_API const CheckResult *FirstFailed() const noexcept;
+};
+
+/// The name of a check in lower case with hyphens, such as "well-formed".
+SSOCLIENT_API const char *GetCheckName(TokenReport::Check check) noexcept;
+
+/// The name of an outcome: "passed", "failed" or "not done".
+SSOCLIENT_API const char *GetOutcomeName(TokenReport::Outcome outcome) noexcept;
+
+/// `report` as text for a log or a person: one line for each check, and below it one for each finding. Printable, and ends
+/// in a line end.
+SSOCLIENT_API std::string WriteTokenReport(const TokenReport &report);
+
+} // namespace SsoClient

@@ -1,0 +1,45 @@
+// SPDX-License-Identifier: Apache-2.0
+/// @file
+/// `VerifyOptions`, what a relying party demands of a token apart from a valid signature.
+
+#pragma once
+
+#include <ssoclient/saml_token.h>
+
+#include <boost/optional.hpp>
+
+#include <cstdint>
+#include <set>
+#include <string>
+
+namespace SsoClient {
+
+/// The default clock tolerance, in seconds.
+constexpr std::int64_t DEFAULT_CLOCK_TOLERANCE_SEC = 600;
+
+/// The form of assertion that is accepted.
+enum class TokenProfile : std::int32_t {
+  STRICT = 0 ///< the form that the token service issues: its elements and attributes in their order, and no others
+};
+
+/// What is checked of a token, in addition to its form, its consistency and its signature. The defaults are those of
+/// `CreateSamlToken`.
+struct VerifyOptions {
+  TokenProfile profile = TokenProfile::STRICT;
+
+  /// How far this machine's clock may be wrong, in seconds. A negative tolerance shortens the time in which a token is
+  /// accepted.
+  std::int64_t clockToleranceSec = DEFAULT_CLOCK_TOLERANCE_SEC;
+
+  /// The audiences to which this program belongs, compared byte for byte. A token that is restricted to other audiences
+  /// only is refused. If the set is empty, the audience of a token is not checked.
+  std::set<std::string> acceptedAudiences;
+
+  /// Whether a token without a restriction to audiences is accepted. Only used if `acceptedAudiences` is not empty.
+  bool acceptUnrestrictedAudience = true;
+
+  /// The confirmation that a token must have; `boost::none` accepts bearer and holder-of-key tokens.
+  boost::optional<SamlToken::ConfirmationType> requiredConfirmation;
+};
+
+} // namespace SsoClient

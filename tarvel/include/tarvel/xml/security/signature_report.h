@@ -1,0 +1,78 @@
+// SPDX-License-Identifier: Apache-2.0
+/// @file
+/// `SignatureReport`, what each rule of a signature's verification looked at and found.
+
+#pragma once
+
+#include <tarvel/core/ref.h>
+#include <tarvel/crypto/certificate.h>
+#include <tarvel/xml/node.h>
+
+#include <cstddef>
+#include <cstdint>
+#include <string>
+#include <vector>
+
+namespace Tarvel::Xml::Security {
+
+/// The rules of a verification, in their order.
+enum class SignatureRule : std::uint8_t {
+  PROFILE,    ///< algorithms, transforms and parts are those of the profile
+  KEYS,       ///< a trusted key can be used with the signature's algorithm
+  REFERENCES, ///< each reference resolves to one node, and envelops the signature if it has that transform
+  VALUE,      ///< a key made the signature's value
+  DIGESTS     ///< each reference has the digest of its target
+};
+
+/// The result of `Signature::Explain`. Nothing of it may be trusted. Texts are as the sender wrote them. Pointers to elements
+/// are valid as long as the signature's tree.
+struct SignatureReport {
+  /// One thing for which the signature is refused.
+  struct Refusal {
+    SignatureRule rule = SignatureRule::PROFILE;
+    std::string message; ///< the text of the `XmlSecurityException` that `Verify` would throw; empty if
+                         ///< `Verify` would return false
+    const ElementNode *element = nullptr; ///< where it is; null if there is no place
+    std::string found;                    ///< what is there; may be empty
+    std::string wanted;                   ///< what the rule accepts there; may be empty
+  };
+
+  /// One reference.
+  struct Reference {
+    std::string uri;
+    const Node *target = nullptr; ///< null if it does not resolve to exactly one node
+    std::vector<std::string> transforms;
+    std::string digestMethod;
+    std::vector<std::uint8_t> digestWanted;
+    std::vector<std::uint8_t> digestComputed; ///< empty if it cannot be computed
+    bool digestMatches = false;
+  };
+
+  /// A key that the resolver trusts.
+  struct Key {
+    Ref<const Crypto::Certificate> certificate; ///< never null
+    bool isNamed = false;                       ///< the `KeyInfo` selects it
+    bool isUsable = false;                      ///< it can be used with the signature's algorithm
+    bool madeSignature = false;                 ///< it made the signature's value
+  };
+
+  /// A certificate in the `KeyInfo`; it is shown only, and never becomes a key.
+  struct NamedCertificate {
+    std::string subject;    ///< empty if it cannot be read
+    std::string thumbprint; ///< SHA-256, as `Certificate::GetSha256Thumbprint`; empty if it cannot be read
+    bool isTrusted = false;
+  };
+
+  std::string canonicalizationMethod;
+  std::string signatureMethod;
+  std::vector<Reference> references;               ///< the first ten
+  std::vector<Key> keys;                           ///< all that the resolver trusts, in order
+  std::vector<NamedCertificate> namedCertificates; ///< the first 16
+  /// In the order of the rules. Empty exactly when `Verify` returns true. Otherwise `Verify` throws an
+  /// `XmlSecurityException` with the first message, or returns false if the first message is empty.
+  std::vector<Refusal> refusals;
+  bool areDigestsComputed = false; ///< whether all digests could be computed
+  bool isValueChecked = false;     ///< whether at least one key could be tried
+};
+
+} // namespace Tarvel::Xml::Security
