@@ -22,6 +22,10 @@ struct Place {
   Place(const Tarvel::Xml::ElementNode &where, std::string_view attributeName = {}) noexcept
       : element(&where), attribute(attributeName) {}
 
+  /// The same for an element that may be null.
+  Place(const Tarvel::Xml::ElementNode *where, std::string_view attributeName = {}) noexcept
+      : element(where), attribute(attributeName) {}
+
   /// The element at the cursor or, if there is no element, the one whose children the cursor moves over.
   Place(const NodeFilterIterator &iterator) noexcept
       : element(IteratorToElement(iterator) ? IteratorToElement(iterator) : Tarvel::Xml::AsElement(iterator.parent)) {}
@@ -38,13 +42,11 @@ struct Place {
 template <typename Allowed, typename Found, typename... Args>
 void Refuse(DeviationSink &sink, const Place &place, const Allowed &allowed, const Found &found,
             std::string_view format, const Args &...args) {
-  using Tarvel::MessageArguments::ToText;
-  if (sink.IsFull()) {
-    sink.Count();
-    return;
-  }
-  sink.Add({Tarvel::MessageFormatter::ASPrint(format, args...), place.element, std::string(place.attribute),
-            ToText(allowed), Tarvel::StringUtil::Shorten(ToText(found))});
+  ReportDeviation(sink, [&] {
+    using Tarvel::MessageArguments::ToText;
+    return Deviation{Tarvel::MessageFormatter::ASPrint(format, args...), place.element, std::string(place.attribute),
+                     ToText(allowed), Tarvel::StringUtil::Shorten(ToText(found))};
+  });
 }
 
 } // namespace SsoClient
