@@ -1,5 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
-// Each rule of a signature's verification in the report on it: alone, and several at once.
+// What the profile refuses, in the report on a signature.
 
 #include "explained.h"
 #include "genuine_token.h"
@@ -23,7 +23,10 @@ using Testing::Explained;
 using Testing::FindElement;
 using Testing::GenuineToken;
 using Testing::IdOf;
+using Testing::RefusalsOf;
 using Testing::Replaced;
+using Testing::Texts;
+using Testing::WRONG_VALUE;
 
 const std::string EXCLUSIVE = "http://www.w3.org/2001/10/xml-exc-c14n#";
 const std::string EXCLUSIVE_TRANSFORM = "<ds:Transform Algorithm=\"" + EXCLUSIVE + "\"/>";
@@ -34,36 +37,6 @@ const std::string CANONICALIZATION_URIS =
 Explained ExplainReplaced(std::string_view from, std::string_view to) {
   return Explain(Replaced(GenuineToken(), from, to));
 }
-
-std::string NameOf(SignatureRule rule) {
-  constexpr const char *NAMES[] = {"PROFILE", "KEYS", "REFERENCES", "VALUE", "DIGESTS"};
-  return NAMES[static_cast<std::size_t>(rule)];
-}
-
-/// A refusal on five lines: rule, message, element, what was found and wanted.
-std::string TextOf(const SignatureReport::Refusal &refusal) {
-  return NameOf(refusal.rule) + "\n" + refusal.message + "\n" +
-         (refusal.element ? std::string(refusal.element->GetName()) : "no element") + "\n" + refusal.found + "\n" +
-         refusal.wanted;
-}
-
-/// The texts of all refusals.
-std::vector<std::string> RefusalsOf(const SignatureReport &report) {
-  std::vector<std::string> texts;
-  for (const SignatureReport::Refusal &refusal : report.refusals) {
-    texts.push_back(TextOf(refusal));
-  }
-  return texts;
-}
-
-std::vector<std::string> RefusalsOf(const Explained &explained) {
-  return RefusalsOf(explained.report);
-}
-
-using Texts = std::vector<std::string>;
-
-/// The refusal of the signature's value; a change of `SignedInfo` causes it, too.
-const std::string WRONG_VALUE = "VALUE\n\nds:SignatureValue\n\na signature by a trusted key";
 
 TEST(Explain, ShowsAllThatAnAcceptedSignatureHas) {
   const Explained explained = Explain(GenuineToken());
