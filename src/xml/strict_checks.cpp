@@ -160,7 +160,7 @@ bool RequireTextualContent(NodeFilterIterator iterator, std::string &text, Devia
   NodeFilterIterator content = iterator.GetChild();
   const Tarvel::Xml::TextNode *const textNode = Tarvel::Xml::AsText(content.node);
   if (!textNode || content.MoveToSibling().node) {
-    Refuse(sink, iterator, "text", WhatIsAt{content.node},
+    Refuse(sink, iterator, "one text", WhatIsAt{content.node},
            "Element '%1' must only have textual content (but has extra children or is empty).", NameOf(element));
     return false;
   }
