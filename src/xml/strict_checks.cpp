@@ -5,7 +5,6 @@
 #include "xml/form_text.h"
 #include "xml/refuse.h"
 
-#include <tarvel/core/exception.h>
 #include <tarvel/core/string_util.h>
 
 #include <boost/lexical_cast.hpp>
@@ -54,9 +53,7 @@ bool Contains(const Names &names, const Name &name) {
 
 void ReadDate(const ElementNode &element, std::string_view name, std::string_view text, Tarvel::System::DateTime &date,
               DeviationSink &sink) {
-  try {
-    date = Tarvel::System::DateTime(text);
-  } catch (const Tarvel::DateTimeFormatException &) {
+  if (!Tarvel::System::DateTime::TryParse(text, date)) {
     Refuse(sink, {element, name}, "a date of the form xsd:dateTime", text, "%1/@%2 is not a date", element.GetName(),
            name);
   }
