@@ -1,10 +1,12 @@
 // SPDX-License-Identifier: Apache-2.0
-// Whichever allocation of C++ fails while a document is read or a token is verified: the call either has the same result as
-// with enough memory or throws `std::bad_alloc`.
+// Whichever allocation of C++ fails while a document is read, or a token is verified or explained: the call either has the
+// same result as with enough memory or throws `std::bad_alloc`.
 #include "integration/out_of_memory/failing_heap.h"
 #include "support/data_file.h"
+#include "support/fixed_environment.h"
 
 #include <ssoclient/create_saml_token.h>
+#include <ssoclient/token_verifier.h>
 #include <tarvel/crypto/certificate.h>
 #include <tarvel/io/reader.h>
 #include <tarvel/xml/document.h>
@@ -15,6 +17,7 @@
 #include <functional>
 #include <map>
 #include <new>
+#include <stdexcept>
 #include <string>
 
 namespace {
@@ -120,6 +123,25 @@ TEST(OutOfHeap, NeverCausesATamperedTokenToBeAccepted) {
   std::string xml = ReadDataFile("tokens/bearer.xml");
   xml.replace(xml.find("alice"), 5, "malory");
   ExpectNothingElse(Verification(xml, "sts-rsa"), "Failed to verify signature: token might have been tampered with.");
+}
+
+/// The outcome is the report as text.
+std::function<void()> Report(const std::string &xml) {
+  const SsoClient::TokenVerifier verifier(Tarvel::Crypto::LoadCertificates(Testing::DataPath("tokens/sts-rsa.crt")));
+  return [xml, verifier] { throw std::runtime_error(WriteTokenReport(verifier.Explain(xml))); };
+}
+
+TEST(OutOfHeap, NeverChangesAReport) {
+  const Testing::FixedEnvironment clock;
+  for (const std::string name :
+       {"tokens/full.xml", "tokens/expired.xml", "attacks/unsigned.xml", "attacks/not-xml.xml"}) {
+    SCOPED_TRACE(name);
+    const auto report = Report(ReadDataFile(name));
+    FailingHeap none(1'000'000, Shortage::ONCE);
+    const std::string full = OutcomeOf(report, none);
+    ASSERT_EQ("The token is ", full.substr(0, 13));
+    ExpectNothingElse(report, full);
+  }
 }
 
 } // namespace
