@@ -58,7 +58,7 @@ NodeFilterIterator TakeListElement(NodeFilterIterator &iterator, std::string_vie
                                    std::string_view namespaceUri, DeviationSink &sink) {
   const bool isTaken =
       RequireElementQName(iterator, localName, namespaceUri, sink) || HasLocalName(iterator, localName);
-  const NodeFilterIterator taken = isTaken ? iterator : PastTheEnd(iterator);
+  NodeFilterIterator taken = isTaken ? iterator : PastTheEnd(iterator);
   iterator.MoveToSibling();
   return taken;
 }
