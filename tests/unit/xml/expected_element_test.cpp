@@ -80,6 +80,7 @@ TEST(TakeElement, StaysWhenThereIsNoSuchElement) {
 TEST(TakeElement, TakesAnElementOfTheLocalNameInAnotherNamespace) {
   EXPECT_EQ((Taken{"y:e", "x:f", {"element {urn:y}e"}}), TakeFirst("<y:e/><x:f/>"));
   EXPECT_EQ((Taken{"y:e", "the end", {"element x:f", "element {urn:y}e"}}), TakeFirst("<x:f/><y:e/>"));
+  EXPECT_EQ((Taken{"y:e", "e", {"element x:f", "element {urn:y}e"}}), TakeFirst("<x:f/><y:e/><e/>"));
 }
 
 TEST(TakeElement, PrefersTheElementInTheRightNamespace) {
