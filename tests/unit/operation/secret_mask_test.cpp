@@ -40,8 +40,8 @@ TEST(SecretMask, MasksEachOccurrenceOfAPassword) {
 
 TEST(SecretMask, MasksAPasswordEscapedForXmlInEachForm) {
   const std::string password = "a<b>&\"c'd";
-  for (const char *form :
-       {"a<b>&\"c'd", "a&lt;b&gt;&amp;\"c'd", "a&lt;b&gt;&amp;&quot;c&apos;d", "a&lt;b&gt;&amp;&#34;c&#39;d"}) {
+  for (const char *form : {"a<b>&\"c'd", "a&lt;b&gt;&amp;\"c'd", "a&lt;b&gt;&amp;&quot;c&apos;d",
+                           "a&lt;b&gt;&amp;&#34;c&#39;d", "a&amp;lt;b&amp;gt;&amp;amp;\"c'd"}) {
     EXPECT_EQ(Masked(password, std::string("[") + form + "]"), "[***]") << form;
   }
 }
@@ -148,6 +148,8 @@ TEST(SecretMask, MasksTheMarkupOfEachSecretElement) {
   const std::pair<const char *, const char *> cases[] = {
       {"[<saml2:Assertion ID='x'>any</saml2:Assertion>]", "[***>]"},
       {"[&lt;Assertion&gt;any&lt;/Assertion&gt;]", "[***&gt;]"},
+      {"[&amp;amp;lt;a:Assertion&amp;amp;gt;any&amp;amp;lt;/a:Assertion&amp;amp;gt;]", "[***&amp;amp;gt;]"},
+      {"[&amp;Assertion&amp;/Assertion]", "[&amp;Assertion&amp;/Assertion]"},
       {"[<ds:Signature><ds:SignatureValue>a</ds:SignatureValue></ds:Signature>]", "[***>]"},
       {"[<Password>a<Password>b</Password>c</Password>d]", "[***>d]"},
       {"[<wsse:BinarySecurityToken>MII", "[***"},
