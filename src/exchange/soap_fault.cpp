@@ -41,8 +41,8 @@ std::string_view NamespaceOf(const ElementNode *element, std::string_view code) 
   return namespaceUri;
 }
 
-/// The node after `node` in document order within `top`, without the nodes below `node` unless `enters`; null after the last
-/// one.
+/// The node after `node` in document order within `top`, without the nodes below `node` unless `enters`; null after the
+/// last one.
 const Node *NextNode(const Node *node, const Node *top, bool enters) noexcept {
   if (enters && node->GetFirstChild()) {
     return node->GetFirstChild();

@@ -27,8 +27,8 @@ Tarvel::Ref<const Tarvel::Xml::ElementNode> ParseResponseDocument(Tarvel::Reader
 /// @throws ParseException for a fault code whose prefix is not bound.
 void CheckSoapFault(const Tarvel::Xml::ElementNode &envelope, FaultListener *listener = nullptr);
 
-/// Follows a path of local names down from `start`, to the first child with each name. Null when there is no such child, and
-/// when `start` is null.
+/// Follows a path of local names down from `start`, to the first child with each name. Null when there is no such
+/// child, and when `start` is null.
 const Tarvel::Xml::ElementNode *FindDescendant(const Tarvel::Xml::ElementNode *start,
                                                std::initializer_list<std::string_view> localNames) noexcept;
 

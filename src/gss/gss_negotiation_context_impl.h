@@ -21,7 +21,8 @@
 
 namespace SsoClient::InternalApi {
 
-/// The first leg starts a negotiation. Each later leg continues it, as long as the service returns a context identifier.
+/// The first leg starts a negotiation. Each later leg continues it, as long as the service returns a context
+/// identifier.
 class GssNegotiationContextImpl final : public virtual GssNegotiationContext {
 public:
   /// @throws Tarvel::InvalidArgumentException when there is no certificate, because no token could be accepted then.

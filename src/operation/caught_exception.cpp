@@ -27,11 +27,15 @@ Caught Describe(const SecretMask &mask) {
   } catch (const std::exception &exception) {
     return {ClassNameOf(&typeid(exception)), mask.Apply(exception.what())};
   } catch (...) {
-    return {ClassNameOf(abi::__cxa_current_exception_type()), ""};
+    return {ClassNameOf(CurrentExceptionClass()), ""};
   }
 }
 
 } // namespace
+
+const std::type_info *CurrentExceptionClass() noexcept {
+  return abi::__cxa_current_exception_type();
+}
 
 std::string ClassNameOf(const std::type_info *type) {
   if (!type) {

@@ -11,11 +11,14 @@
 
 namespace SsoClient {
 
+/// The class of the exception that is being handled; null if it is not an exception of C++.
+const std::type_info *CurrentExceptionClass() noexcept;
+
 /// The name of a class without its namespaces, such as "SsoException"; "unknown" for null.
 std::string ClassNameOf(const std::type_info *type);
 
-/// Writes that `subject`, such as "The observer's OnFault", threw the exception that is being handled. The line contains no
-/// secret of `mask`.
+/// Writes that `subject`, such as "The observer's OnFault", threw the exception that is being handled. The line
+/// contains no secret of `mask`.
 /// @param id of the operation, with which the line begins; may be empty
 void LogCaughtException(const std::string &id, const char *subject, const SecretMask &mask) noexcept;
 

@@ -3,7 +3,6 @@
 #include "operation/operation_events.h"
 
 #include "exchange/soap_fault.h"
-#include "operation/caught_exception.h"
 
 #include <tarvel/core/string_util.h>
 
@@ -40,9 +39,9 @@ void OperationEvents::Hide(const std::string &password) noexcept {
   }
 }
 
-void OperationEvents::HideToken(const SamlToken &token) {
+void OperationEvents::HideToken(const SamlToken &token) noexcept {
   if (m_observer) {
-    m_mask.AddToken(token.ToXml());
+    m_mask.AddToken(token);
   }
 }
 
@@ -121,11 +120,14 @@ void OperationEvents::ReportSent(Request &request) noexcept {
 }
 
 void OperationEvents::ReportReceived(const ResponseFacts *facts, const char *failure, Clock::time_point sent) noexcept {
+  if (!facts) {
+    return; // there was no memory for them, so nothing is known of the response
+  }
   Report("The observer's OnResponseReceived", [&] {
     ResponseReceivedEvent event;
     event.durationMicroseconds = MicrosecondsSince(sent);
     event.leg = m_leg;
-    if (facts && facts->status != 0) {
+    if (facts->status != 0) {
       event.status = facts->status;
       event.reason = m_mask.Apply(facts->reason);
       event.contentType = m_mask.Apply(facts->contentType);

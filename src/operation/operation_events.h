@@ -7,6 +7,7 @@
 #include "exchange/fault_listener.h"
 #include "exchange/request.h"
 #include "exchange/response_handler.h"
+#include "operation/caught_exception.h"
 #include "operation/secret_mask.h"
 #include "transport/transport.h"
 
@@ -18,7 +19,6 @@
 #include <chrono>
 #include <cstddef>
 #include <cstdint>
-#include <cxxabi.h>
 #include <exception>
 #include <memory>
 #include <string>
@@ -29,8 +29,8 @@
 
 namespace SsoClient {
 
-/// The events of one operation. Without an observer, nothing is computed and no memory is used. What the observer throws is
-/// logged, and so is a lack of memory for an event; neither changes the operation. For one thread.
+/// The events of one operation. Without an observer, nothing is computed and no memory is used. What the observer
+/// throws is logged, and so is a lack of memory for an event; neither changes the operation. For one thread.
 class OperationEvents final : public FaultListener {
 public:
   /// Not observed.
@@ -54,7 +54,7 @@ public:
 
   /// From now on, no event contains the secret.
   void Hide(const std::string &password) noexcept;
-  void HideToken(const SamlToken &token);
+  void HideToken(const SamlToken &token) noexcept;
   void HideToken(const std::string &tokenXml) noexcept;
   void HideLeg(const std::vector<std::uint8_t> &leg) noexcept;
 
@@ -99,7 +99,7 @@ std::invoke_result_t<const Call &> OperationEvents::Run(const Call &call) {
     ReportFailure(&typeid(failure), failure.what());
     throw;
   } catch (...) {
-    ReportFailure(abi::__cxa_current_exception_type(), "");
+    ReportFailure(CurrentExceptionClass(), "");
     throw;
   }
 }

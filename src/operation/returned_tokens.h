@@ -16,8 +16,8 @@
 
 namespace SsoClient {
 
-/// Verifies with the options of the service, and hands each refused token to the sink. Immutable, so any number of threads may
-/// use it.
+/// Verifies with the options of the service, and hands each refused token to the sink. Immutable, so any number of
+/// threads may use it.
 class ReturnedTokens {
 public:
   /// @param trustedCertificates the certificates with which the service signs

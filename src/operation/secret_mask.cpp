@@ -20,10 +20,12 @@ constexpr std::string_view MASK = "***";
 constexpr std::string_view WHITE_SPACE = " \t\r\n";
 constexpr std::string_view END_OF_NAME = " \t\r\n/>&";
 
-/// At the end of a text, at least so many bytes of the beginning of a secret are masked: a service may cut what it repeats.
+/// At the end of a text, at least so many bytes of the beginning of a secret are masked: a service may cut what it
+/// repeats.
 constexpr std::size_t MIN_BEGINNING = 8;
 
-/// The number of bytes after which secrets that overlap are not told apart any more, and the rest of the text is masked.
+/// The number of bytes after which secrets that overlap are not told apart any more, and the rest of the text is
+/// masked.
 constexpr std::size_t MAX_OVERLAP_BYTES = std::size_t{1} << 20;
 
 SecretText WithoutWhiteSpace(std::string_view text) {
@@ -113,8 +115,8 @@ std::string_view LocalNameOf(std::string_view name) noexcept {
   return colon == std::string_view::npos ? name : name.substr(colon + 1);
 }
 
-/// Where the element that begins at `begin` ends, if its content is secret: after the name in its end tag, or at the end of the
-/// text; otherwise `begin`.
+/// Where the element that begins at `begin` ends, if its content is secret: after the name in its end tag, or at the
+/// end of the text; otherwise `begin`.
 std::size_t FindSecretElementEnd(std::string_view text, std::size_t begin) noexcept {
   const std::string_view name = TagName(text.substr(begin));
   if (name.empty() || !IsSecretElement(LocalNameOf(name))) {
@@ -152,6 +154,10 @@ void SecretMask::AddPassword(const std::string &password) noexcept {
 
 void SecretMask::AddLeg(const std::vector<std::uint8_t> &leg) noexcept {
   Guard([&] { AddSecret(Base64(leg.data(), leg.size())); });
+}
+
+void SecretMask::AddToken(const SamlToken &token) noexcept {
+  Guard([&] { AddToken(token.ToXml()); });
 }
 
 void SecretMask::AddToken(const std::string &tokenXml) noexcept {

@@ -8,8 +8,8 @@
 
 namespace SsoClient {
 
-/// Logs the start when it is created and the end when it is destroyed, after a return or an exception. Both lines have the
-/// same new UUID.
+/// Logs the start when it is created and the end when it is destroyed, after a return or an exception. Both lines have
+/// the same new UUID.
 class OperationFrame {
 public:
   explicit OperationFrame(const std::string &operationName);

@@ -23,8 +23,9 @@
 
 namespace SsoClient {
 
-/// Coordinates three collaborators, which compose requests, send them and read responses. Copies share the collaborators,
-/// which must be safe on any thread. An asynchronous operation runs on a copy, so it may outlive the service that started it.
+/// Coordinates three collaborators, which compose requests, send them and read responses. Copies share the
+/// collaborators, which must be safe on any thread. An asynchronous operation runs on a copy, so it may outlive the
+/// service that started it.
 class SecurityTokenServiceImpl final : public SecurityTokenService {
 public:
   SecurityTokenServiceImpl(std::shared_ptr<const RequestBuilder> requestBuilder,
@@ -79,8 +80,8 @@ private:
   /// Runs `operation` once with its events, between the first and the last line of its log.
   template <typename Operation>
   auto Run(const char *name, const Operation &operation) const;
-  /// Posts in a new session. Session and request are destroyed before this returns, so that a password in the request does
-  /// not stay in memory while the response is processed.
+  /// Posts in a new session. Session and request are destroyed before this returns, so that a password in the request
+  /// does not stay in memory while the response is processed.
   Tarvel::Ref<Tarvel::Reader> Send(Request &&request, OperationEvents &events) const;
   /// The verified token that `readTokenXml` finds in `response`; null when the text that it finds is empty.
   std::shared_ptr<const SamlToken>

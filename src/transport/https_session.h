@@ -18,8 +18,8 @@
 
 namespace SsoClient {
 
-/// Posts requests with its own cookie store: a cookie that the service sets in one leg of a negotiation is sent in the next
-/// leg, and in no other session.
+/// Posts requests with its own cookie store: a cookie that the service sets in one leg of a negotiation is sent in the
+/// next leg, and in no other session.
 class HttpsSession final : public TransportSession {
 public:
   HttpsSession(const Tarvel::Ref<Tarvel::Http::ConnectionSpec> &spec, const std::string &path,

@@ -1,6 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// The operations of a service whose network is replaced, with an observer: request builder and response handler are real.
+/// The operations of a service whose network is replaced, with an observer: request builder and response handler are
+/// real.
 
 #pragma once
 
