@@ -161,6 +161,12 @@ TEST(SecretMask, MasksTheMarkupOfEachSecretElement) {
   }
 }
 
+TEST(SecretMask, GivesUpOnSecretsThatOverlapForAMegabyteAndMasksTheRest) {
+  const std::size_t megabyte = 1u << 20;
+  EXPECT_EQ(Masked("aa", std::string(megabyte - 10, 'a') + " text"), "*** text");
+  EXPECT_EQ(Masked("aa", std::string(megabyte + 10, 'a') + " text"), "***");
+}
+
 // Each of these took minutes if every position of the text were compared with the whole rest of it.
 TEST(SecretMask, EndsInLinearTimeForHostileTexts) {
   const std::size_t length = 10u << 20;
