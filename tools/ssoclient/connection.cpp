@@ -86,7 +86,8 @@ void CheckConnection(const ConnectionOptions &options) {
 
 std::shared_ptr<SecurityTokenService> CreateService(const ConnectionOptions &options,
                                                     const Tarvel::Crypto::CertificateList &trusted,
-                                                    const boost::optional<HolderOfKeyConfig> &identity) {
+                                                    const boost::optional<HolderOfKeyConfig> &identity,
+                                                    const ServiceOptions &serviceOptions) {
   SecurityTokenServiceConfig config;
   config.stsUrl = options.url;
   config.signingCertificates = trusted;
@@ -101,8 +102,8 @@ std::shared_ptr<SecurityTokenService> CreateService(const ConnectionOptions &opt
       context->TrustSystemStore();
     }
   }
-  config.sslContext = context.get();         // null for plain http
-  return CreateSecurityTokenService(config); // takes its own reference to the context
+  config.sslContext = context.get();                         // null for plain http
+  return CreateSecurityTokenService(config, serviceOptions); // takes its own reference to the context
 }
 
 } // namespace SsoClient::Tool
