@@ -2,6 +2,7 @@
 // What acquire prints for every kind of answer of the service.
 
 #include "expect_result.h"
+#include "refusals.h"
 #include "service_test.h"
 #include "token_values.h"
 
@@ -36,7 +37,8 @@ std::time_t SecondsOf(const std::string &text) {
 }
 
 TEST_F(Acquire, ByPasswordShowsTheTokenAsText) {
-  const Result result = Run("ssoclient acquire " + Service() + PASSWORD + "--out token.xml");
+  Result result = Run("ssoclient acquire " + Service() + PASSWORD + "--out token.xml");
+  result.out = WithoutDistances(result.out);
   ExpectResult(result, 0, FillFrom(m_folder.Read("token.xml"), ReadDataFile("tool/acquired_by_password.txt")), "");
 }
 
@@ -255,19 +257,20 @@ protected:
 
   std::string Message() const { return Fill(GetParam().message, "@PORT@", std::to_string(m_service.GetPort())); }
 
+  /// Only the refusal of a token that the service issued has a hint.
+  std::string Hint() const { return IsAboutToken(GetParam().exceptionClass) ? SAVE_HINT : ""; }
+
   std::set<std::string> m_before;
 };
 
-TEST_P(AcquireRefusal, IsOneLineOfTextAndAnExitCodeAndNoFile) {
-  ExpectResult(Run(Line()), GetParam().exitCode, "",
-               std::string("ssoclient: ") + GetParam().label + ": " + Message() + "\n");
+TEST_P(AcquireRefusal, IsALineOfTextAndAnExitCodeAndNoFile) {
+  ExpectResult(Run(Line()), GetParam().exitCode, "", RefusalText(GetParam().label, Message(), Hint()));
   EXPECT_EQ(m_before, m_folder.Names());
 }
 
 TEST_P(AcquireRefusal, IsOneJsonObjectAndTheSameExitCode) {
   ExpectResult(Run(Line() + "--format json"), GetParam().exitCode, "",
-               std::string(R"({"schema":1,"error":{"class":")") + GetParam().exceptionClass + R"(","message":")" +
-                   Message() + "\"}}\n");
+               RefusalJson(GetParam().exceptionClass, Message(), Hint()));
   EXPECT_EQ(m_before, m_folder.Names());
 }
 
@@ -288,7 +291,9 @@ TEST_F(Acquire, RefusesATokenThatIsNotSigned) {
   EXPECT_EQ(8, result.exitCode);
   EXPECT_EQ("", result.out);
   EXPECT_THAT(result.err, MatchesRegex("ssoclient: service fault: Signature syntax error: Expected ds:Signature, "
-                                       "found \"saml:Subject\" at line 1, column [0-9]+\n"));
+                                       "found \"saml:Subject\" at line 1, column [0-9]+\n"
+                                       "ssoclient: hint: " +
+                                       std::string(SAVE_HINT) + "\n"));
   EXPECT_EQ(0u, m_folder.Names().count("token.xml"));
 }
 

@@ -204,7 +204,7 @@ TEST(TokenJson, IsAsciiWhateverTheTokenSays) {
   EXPECT_TRUE(std::all_of(json.begin(), json.end(), [](char octet) {
     return octet == '\n' || (octet >= ' ' && octet <= '~');
   })) << json;
-  EXPECT_EQ(facts.id, ordered_json::parse(json)["id"].get<std::string>());
+  EXPECT_EQ(*facts.id, ordered_json::parse(json)["id"].get<std::string>());
 }
 
 const TextStyle PLAIN{100, false};
