@@ -30,14 +30,15 @@ std::string_view TextOf(const ElementNode *element) noexcept {
   return text ? text->GetValue() : std::string_view();
 }
 
-QNameView ResolveCode(const ElementNode *element, std::string_view code) noexcept {
+/// The namespace of a code, by the same rules as in `CheckSoapFault`.
+std::string_view NamespaceOf(const ElementNode *element, std::string_view code) noexcept {
   const std::size_t colon = code.find(':');
   if (colon == std::string_view::npos) {
-    return {code.empty() ? std::string_view() : Namespaces::SOAPENV, code};
+    return code.empty() ? std::string_view() : Namespaces::SOAPENV;
   }
   std::string_view namespaceUri;
   element->LookupNamespace(code.substr(0, colon), namespaceUri);
-  return {namespaceUri, code.substr(colon + 1)};
+  return namespaceUri;
 }
 
 /// The node after `node` in document order within `top`, without the nodes below `node` unless `enters`; null after the last
@@ -80,7 +81,7 @@ SoapFault ReadSoapFault(const ElementNode &fault) {
   const ElementNode *const codeElement = fault.FindChildElement("faultcode");
   const std::string_view code = TextOf(codeElement);
   const ElementNode *const detail = fault.FindChildElement("detail");
-  return {code, ResolveCode(codeElement, code), TextOf(fault.FindChildElement("faultstring")),
+  return {code, NamespaceOf(codeElement, code), TextOf(fault.FindChildElement("faultstring")),
           detail ? ShownTexts(*detail) : std::string()};
 }
 

@@ -4,8 +4,6 @@
 
 #pragma once
 
-#include "xml/qualified_name.h"
-
 #include <tarvel/xml/node.h>
 
 #include <string>
@@ -16,10 +14,10 @@ namespace SsoClient {
 /// The texts are as the service wrote them, at full length, and may contain secrets that the service repeats. The views
 /// are valid as long as the fault's tree.
 struct SoapFault {
-  std::string_view code; ///< as written; empty if there is none
-  QNameView name;        ///< of the code; its namespace is empty if the prefix is not bound
-  std::string_view text; ///< the `faultstring`
-  std::string detail;    ///< the texts in the `detail` element that may be shown, with blanks between them
+  std::string_view code;          ///< as written; empty if there is none
+  std::string_view codeNamespace; ///< of the code; empty if its prefix is not bound
+  std::string_view text;          ///< the `faultstring`
+  std::string detail;             ///< the texts in the `detail` element that may be shown, with blanks between them
 };
 
 /// Reads the children of the `Fault` element. Whatever is missing is empty. The time is linear in the length of the fault.

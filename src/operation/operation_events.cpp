@@ -83,9 +83,11 @@ void OperationEvents::OnFault(const Tarvel::Xml::ElementNode &fault) noexcept {
   Report("The observer's OnFault", [&] {
     const SoapFault read = ReadSoapFault(fault);
     FaultEvent event;
-    event.codeNamespace = m_mask.Apply(read.name.namespaceUri);
-    event.codeName = m_mask.Apply(read.name.localName);
+    event.codeNamespace = m_mask.Apply(read.codeNamespace);
     event.code = m_mask.Apply(read.code);
+    // Divided after it was masked, because the colon may be a part of a secret.
+    event.codeName = event.code.substr(event.code.find(':') + 1);
+    m_mask.AddPrefixOf(read.code, event.code);
     event.text = m_mask.Apply(read.text);
     event.detail = m_mask.Apply(read.detail);
     m_observer->OnFault(m_operation, event);

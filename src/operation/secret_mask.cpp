@@ -88,9 +88,18 @@ std::size_t CharacterLength(std::string_view text) noexcept {
   return length;
 }
 
-/// The length of "<" as it is or escaped at the beginning of `text`; 0 if there is none.
+/// The length of "<", as it is or escaped any number of times, at the beginning of `text`; 0 if there is none.
 std::size_t MarkupBeginLength(std::string_view text) noexcept {
-  return text.starts_with('<') ? 1 : text.starts_with("&lt;") ? 4 : 0;
+  constexpr std::string_view AMP = "amp;";
+  constexpr std::string_view LT = "lt;";
+  if (text.starts_with('<')) {
+    return 1;
+  }
+  std::size_t length = text.starts_with('&') ? 1 : 0;
+  while (length > 0 && text.substr(length).starts_with(AMP)) {
+    length += AMP.size();
+  }
+  return length > 0 && text.substr(length).starts_with(LT) ? length + LT.size() : 0;
 }
 
 /// The name of the element whose start tag is at the beginning of `text`; empty if no tag is there.
@@ -112,7 +121,7 @@ std::size_t FindSecretElementEnd(std::string_view text, std::size_t begin) noexc
     return begin;
   }
   int depth = 1;
-  std::size_t end = begin + name.size();
+  std::size_t end = begin + MarkupBeginLength(text.substr(begin)) + name.size();
   while (depth > 0) {
     const std::size_t next = text.find(name, end);
     if (next == std::string_view::npos) {
@@ -156,6 +165,13 @@ void SecretMask::AddRequest(const std::string &envelope) noexcept {
   Guard([&] { AddValues(envelope); });
 }
 
+void SecretMask::AddPrefixOf(std::string_view qualifiedName, std::string_view masked) noexcept {
+  const std::size_t colon = qualifiedName.find(':');
+  if (colon != std::string_view::npos && !masked.starts_with(qualifiedName.substr(0, colon + 1))) {
+    Guard([&] { AddSecret(SecretText(qualifiedName.substr(0, colon))); });
+  }
+}
+
 std::string SecretMask::Apply(std::string_view text) const {
   if (m_isIncomplete) {
     return std::string(text.empty() ? "" : MASK);
@@ -187,7 +203,9 @@ void SecretMask::Guard(const AddAll &addAll) noexcept {
 void SecretMask::AddText(std::string_view text) {
   AddSecret(SecretText(text));
   for (const Quotes quotes : {Quotes::PLAIN, Quotes::ENTITIES, Quotes::NUMBERS}) {
-    AddSecret(Escaped(text, quotes));
+    const SecretText escaped = Escaped(text, quotes);
+    AddSecret(Escaped(escaped.Get(), quotes)); // a service may put one message into another
+    AddSecret(SecretText(escaped));
   }
 }
 

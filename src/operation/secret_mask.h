@@ -18,7 +18,7 @@ namespace SsoClient {
 /// mask is destroyed. Used by one thread at a time.
 class SecretMask {
 public:
-  /// Masks the password as it is, without the blanks around it, escaped for XML, and in Base64. An empty password is
+  /// Masks the password as it is, without the blanks around it, escaped for XML once or twice, and in Base64. An empty password is
   /// ignored.
   void AddPassword(const std::string &password) noexcept;
 
@@ -30,6 +30,9 @@ public:
 
   /// Masks the values of signatures and negotiations in a request.
   void AddRequest(const std::string &envelope) noexcept;
+
+  /// Masks the prefix of `qualifiedName` if the colon after it is masked in `masked`: exceptions quote a prefix without its colon.
+  void AddPrefixOf(std::string_view qualifiedName, std::string_view masked) noexcept;
 
   /// `text` with "***" in place of secrets, printable (`Tarvel::StringUtil::Printable`), and cut at
   /// `Tarvel::StringUtil::MAX_VALUE_BYTES` bytes, at whose end it then says how many bytes of `text` are missing. A secret that the
