@@ -16,6 +16,8 @@ namespace {
 
 using Outcome = TokenReport::Outcome;
 
+constexpr const char *DETAIL = "\n  "; ///< begins an indented line of a cell
+
 Colour ColourOf(Outcome outcome) noexcept {
   if (outcome == Outcome::NOT_DONE) {
     return Colour::YELLOW;
@@ -25,45 +27,55 @@ Colour ColourOf(Outcome outcome) noexcept {
 
 /// A part of a finding in a line of its own.
 std::string LineUnlessEmpty(std::string_view label, std::string_view value) {
-  return value.empty() ? std::string() : "\n" + std::string(label) + PrintableValue(value);
+  return value.empty() ? std::string() : DETAIL + std::string(label) + PrintableValue(value);
 }
 
+/// The place in one line, such as "line 3, column 5: /saml2:Assertion, attribute Version".
 std::string PlaceText(const TokenReport::Finding &finding) {
-  std::string text = LineUnlessEmpty("at ", finding.path.empty() ? finding.element : finding.path);
+  std::string text = PrintableValue(finding.path.empty() ? finding.element : finding.path);
   if (!finding.attribute.empty()) {
-    text += LineUnlessEmpty("attribute ", finding.attribute);
+    text += ", attribute " + PrintableValue(finding.attribute);
   }
   if (finding.line > 0) {
-    text += "\nline " + std::to_string(finding.line);
-    text += finding.column > 0 ? ", column " + std::to_string(finding.column) : "";
+    const std::string column = finding.column > 0 ? ", column " + std::to_string(finding.column) : "";
+    text = "line " + std::to_string(finding.line) + column + (text.empty() ? "" : ": ") + text;
   }
-  return text;
+  return text.empty() ? text : DETAIL + text;
 }
 
-Table::Row FindingRow(const TokenReport::Finding &finding) {
+/// @param isRepeated whether the line before has the same remedy
+Table::Row FindingRow(const TokenReport::Finding &finding, bool isRepeated) {
   std::string found = PrintableValue(finding.message) + PlaceText(finding) +
                       LineUnlessEmpty("wanted: ", finding.wanted) + LineUnlessEmpty("found: ", finding.found);
   if (finding.missedBySec != 0) {
-    found += "\nmissed by " + SpanText(finding.missedBySec);
+    found += DETAIL + ("missed by " + SpanText(finding.missedBySec));
   }
-  return {Cell{}, Cell{}, Cell{std::move(found)}, Cell{PrintableValue(finding.remedy)}};
+  return {Cell{}, Cell{}, Cell{std::move(found)}, Cell{isRepeated ? "" : PrintableValue(finding.remedy)}};
 }
 
 void AddCheck(const TokenReport::CheckResult &result, Table &table) {
   table.Add({Cell{GetCheckName(result.check)}, Cell{GetOutcomeName(result.outcome), ColourOf(result.outcome)},
              Cell{PrintableValue(result.summary)}, Cell{}});
+  const std::string *remedy = nullptr;
   for (const TokenReport::Finding &finding : result.findings) {
-    table.Add(FindingRow(finding));
+    table.Add(FindingRow(finding, remedy && *remedy == finding.remedy));
+    remedy = &finding.remedy;
   }
   if (result.unlistedFindings > 0) {
     table.Add({Cell{}, Cell{}, Cell{"and " + std::to_string(result.unlistedFindings) + " more findings"}, Cell{}});
   }
 }
 
+/// Whether the check needs something that only a caller of `verify` gives.
+bool NeedsCaller(TokenReport::Check check) noexcept {
+  using Check = TokenReport::Check;
+  return check == Check::KEYS || check == Check::SIGNATURE || check == Check::AUDIENCE ||
+         check == Check::REQUIRED_CONFIRMATION;
+}
+
 /// Whether the check is shown. Without trust, only deviations are, and the checks for which they leave nothing to look at.
 bool IsShown(const TokenReport::CheckResult &result, bool usesTrust) noexcept {
-  const bool isAboutTrust = result.check == TokenReport::Check::KEYS || result.check == TokenReport::Check::SIGNATURE;
-  return usesTrust || (result.outcome != Outcome::PASSED && !isAboutTrust);
+  return usesTrust || (result.outcome != Outcome::PASSED && !NeedsCaller(result.check));
 }
 
 std::string DigestText(const TokenReport::Reference &reference) {

@@ -37,19 +37,32 @@ std::size_t OctetsOf(std::string_view text, std::size_t count) noexcept {
   return octets;
 }
 
-/// Adds the lines of `text`, which has no line feed, to `lines`.
+/// The octets of the beginning of `text` that fit in a line of `most` octets: up to a blank, or in a word that is longer than
+/// a line, such as a path or a URI, up to a separator in its second half.
+std::size_t PlaceToBreak(std::string_view text, std::size_t most) noexcept {
+  // A blank right after a full line is a place to break, too.
+  const std::size_t blank = text.substr(0, most + 1).rfind(' ');
+  if (blank != std::string_view::npos && blank > 0) {
+    return blank;
+  }
+  const std::size_t separator = text.substr(0, most).find_last_of("/:#");
+  return separator != std::string_view::npos && separator >= most / 2 ? separator + 1 : most;
+}
+
+/// Adds the lines of `text`, which has no line feed, to `lines`, each indented as `text` is.
 void WrapLine(std::string_view text, std::size_t width, std::vector<std::string> &lines) {
+  const std::size_t blanks = std::min(text.find_first_not_of(' '), text.size());
+  const std::string indent(blanks < width / 2 ? blanks : 0, ' ');
+  text.remove_prefix(indent.size());
   while (true) {
-    const std::size_t most = OctetsOf(text, width);
+    const std::size_t most = OctetsOf(text, width - indent.size());
     if (most == text.size()) {
-      lines.emplace_back(text);
+      lines.push_back(indent + std::string(text));
       return;
     }
-    // A blank right after a full line is a place to break, too.
-    const std::size_t blank = text.substr(0, most + 1).rfind(' ');
-    const bool hasBlank = blank != std::string_view::npos && blank > 0;
-    lines.emplace_back(text.substr(0, hasBlank ? blank : most));
-    text.remove_prefix(hasBlank ? blank + 1 : most);
+    const std::size_t end = PlaceToBreak(text, most);
+    lines.push_back(indent + std::string(text.substr(0, end)));
+    text.remove_prefix(text[end] == ' ' ? end + 1 : end);
   }
 }
 

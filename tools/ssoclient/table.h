@@ -14,8 +14,10 @@
 
 namespace SsoClient::Tool {
 
-/// `text` in lines of at most `width` characters, broken at blanks, and within a word only if the word is longer than a line.
-/// A line feed in `text` ends a line, too. At least one line.
+/// `text` in lines of at most `width` characters, broken at blanks, and within a word only if the word is longer than a line;
+/// then, if possible, after a separator of paths and URIs.
+/// A line feed in `text` ends a line, too. What follows in a line that begins with blanks is indented in the same way. At least
+/// one line.
 /// @param width at least 1
 std::vector<std::string> Wrap(std::string_view text, std::size_t width);
 

@@ -31,18 +31,21 @@ struct CertificateFacts {
 struct TokenFacts {
   boost::optional<std::string> id;
   boost::optional<PrincipalId> subject;
-  boost::optional<SamlToken::ConfirmationType> confirmation;
-  boost::optional<Tarvel::System::DateTime> startDate;
-  boost::optional<Tarvel::System::DateTime> endDate;
-  boost::optional<bool> renewable;
-  boost::optional<bool> delegable;
-  boost::optional<bool> solution;
   boost::optional<std::pair<std::string, std::string>> fullName; ///< first name and last name
   std::vector<PrincipalId> groups;
   std::vector<Delegate> delegationChain;
+
+  boost::optional<SamlToken::ConfirmationType> confirmation;
+  boost::optional<CertificateFacts> certificate;
+
+  boost::optional<Tarvel::System::DateTime> startDate;
+  boost::optional<Tarvel::System::DateTime> endDate;
   std::set<std::string> audience;
   std::vector<Advice> advice;
-  boost::optional<CertificateFacts> certificate;
+
+  boost::optional<bool> renewable;
+  boost::optional<bool> delegable;
+  boost::optional<bool> solution;
 };
 
 /// The facts of a verified token.

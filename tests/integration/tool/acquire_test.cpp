@@ -167,16 +167,20 @@ TEST_F(Acquire, ChecksAnIssuedTokenWithANarrowerTolerance) {
 
 constexpr const char *OPERATION = "[0-9a-f]{8}(-[0-9a-f]{4}){3}-[0-9a-f]{12}";
 
-TEST_F(Acquire, ShowsTheLibrarysLogWithoutSecrets) {
+TEST_F(Acquire, ShowsTheLibrarysLogAndTheEventsWithoutSecrets) {
   const Result result = Run("ssoclient acquire -v " + Service() + PASSWORD + "--format xml");
   EXPECT_EQ(0, result.exitCode);
   std::istringstream lines(result.err);
   const std::string expected[] = {
       std::string("ssoclient: log: opId=") + OPERATION + " START operation SecurityTokenServiceImpl::AcquireToken",
+      std::string("ssoclient: started AcquireToken ") + OPERATION,
       "ssoclient: log: Requested token for subject `alice@corp\\.example', spec `.*'",
       "ssoclient: log: SecurityTokenServiceImpl::AcquireToken sending request",
+      "ssoclient: request: http://docs\\.oasis-open\\.org/ws-sx/ws-trust/200512/RST/Issue, [0-9]+ octets",
+      "ssoclient: response: 200 OK, text/xml; charset=utf-8, [0-9]+ octets, [0-9]+ ms",
       "ssoclient: log: SecurityTokenServiceImpl::AcquireToken processing response",
       "ssoclient: log: Successfully acquired token: .*",
+      "ssoclient: ended: succeeded after [0-9]+ ms",
       std::string("ssoclient: log: opId=") + OPERATION + " END operation SecurityTokenServiceImpl::AcquireToken"};
   for (const std::string &pattern : expected) {
     std::string line;

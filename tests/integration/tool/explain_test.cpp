@@ -64,10 +64,10 @@ struct Refused {
 };
 
 TEST(VerifyExplain, EndsAsVerifyDoesAndReportsTheSameRefusal) {
-  for (const Refused &refused : {Refused{"expired.xml", 5}, Refused{"early.xml", 5}, Refused{"signed-by-other.xml", 6},
-                                 Refused{"sts-rsa.crt", 5}, Refused{"../attacks/other-root.xml", 5},
-                                 Refused{"../foreign/saml2.xml", 5}, Refused{"../attacks/value-zeros.xml", 6},
-                                 Refused{"missing.xml", 7}}) {
+  for (const Refused &refused :
+       {Refused{"expired.xml", 5}, Refused{"early.xml", 5}, Refused{"signed-by-other.xml", 6},
+        Refused{"sts-rsa.crt", 5}, Refused{"../attacks/other-root.xml", 5}, Refused{"../foreign/saml2.xml", 5},
+        Refused{"../attacks/value-zeros.xml", 6}, Refused{"missing.xml", 7}}) {
     SCOPED_TRACE(refused.file);
     const Result plain = RunTool({"verify", "--trust", "sts-rsa.crt", refused.file});
     const Result text = RunTool(Explain(refused.file));
@@ -184,12 +184,12 @@ TEST(VerifyDemands, AcceptATokenForEveryAudience) {
 }
 
 TEST(VerifyDemands, RefuseAnotherConfirmation) {
-  ExpectResult(RunTool({"verify", "--trust", "sts-rsa.crt", "bearer.xml", "--require", "holder-of-key"}), 5, "",
-               RefusalText("token invalid", "The token's confirmation is bearer, but holder-of-key is required",
-                           EXPLAIN_HINT));
-  ExpectResult(RunTool({"verify", "--trust", "sts-rsa.crt", "full.xml", "--require", "bearer"}), 5, "",
-               RefusalText("token invalid", "The token's confirmation is holder-of-key, but bearer is required",
-                           EXPLAIN_HINT));
+  ExpectResult(
+      RunTool({"verify", "--trust", "sts-rsa.crt", "bearer.xml", "--require", "holder-of-key"}), 5, "",
+      RefusalText("token invalid", "The token's confirmation is bearer, but holder-of-key is required", EXPLAIN_HINT));
+  ExpectResult(
+      RunTool({"verify", "--trust", "sts-rsa.crt", "full.xml", "--require", "bearer"}), 5, "",
+      RefusalText("token invalid", "The token's confirmation is holder-of-key, but bearer is required", EXPLAIN_HINT));
   EXPECT_EQ(0, RunTool({"verify", "--trust", "sts-rsa.crt", "bearer.xml", "--require", "bearer"}).exitCode);
   EXPECT_EQ(0, RunTool({"verify", "--trust", "sts-rsa.crt", "full.xml", "--require", "holder-of-key"}).exitCode);
 }

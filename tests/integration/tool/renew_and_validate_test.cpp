@@ -76,9 +76,9 @@ TEST_F(Renew, RefusesTheServicesWrongAnswers) {
   const auto run = [&](const char *fault) {
     return Run("ssoclient renew " + Service(fault) + IDENTITY + "--out renewed.xml token.xml");
   };
-  ExpectResult(run("wrong-signer"), 6, "",
-               RefusalText("signature invalid", "Failed to verify signature: token might have been tampered with.",
-                           SAVE_HINT));
+  ExpectResult(
+      run("wrong-signer"), 6, "",
+      RefusalText("signature invalid", "Failed to verify signature: token might have been tampered with.", SAVE_HINT));
   ExpectResult(run("wrong-wrapper"), 8, "", "ssoclient: service fault: Unexpected XML format\n");
   ExpectResult(run("bad-status-404"), 4, "", "ssoclient: communication failed: Server returned error: 404 Not Found\n");
   EXPECT_EQ(0u, m_folder.Names().count("renewed.xml"));

@@ -25,6 +25,16 @@ TEST(Wrap, BreaksAWordThatIsLongerThanALine) {
   EXPECT_THAT(Wrap("ab cdefgh", 4), ElementsAre("ab", "cdef", "gh"));
 }
 
+TEST(Wrap, BreaksALongPathAfterASeparator) {
+  EXPECT_THAT(Wrap("/saml2:Assertion/saml2:Subject", 20), ElementsAre("/saml2:Assertion/", "saml2:Subject"));
+  EXPECT_THAT(Wrap("urn:abcdefghijklmnopqrstuvw", 10), ElementsAre("urn:abcdef", "ghijklmnop", "qrstuvw"));
+}
+
+TEST(Wrap, IndentsTheRestOfAnIndentedLine) {
+  EXPECT_THAT(Wrap("one two\n  three four", 8), ElementsAre("one two", "  three", "  four"));
+  EXPECT_THAT(Wrap("    one two", 8), ElementsAre("    one", "two")); // the blanks would take half of the line
+}
+
 TEST(Wrap, KeepsTheLinesOfTheText) {
   EXPECT_THAT(Wrap("one\ntwo three\n\nfour", 5), ElementsAre("one", "two", "three", "", "four"));
 }

@@ -67,6 +67,7 @@ TokenReport Foreign() {
   finding.remedy = "Ask for the accepted form.";
   Fail(report, Check::KEYS, "No key");
   ResultOf(report, Check::SIGNATURE).outcome = Outcome::NOT_DONE;
+  ResultOf(report, Check::REQUIRED_CONFIRMATION).outcome = Outcome::NOT_DONE;
   return report;
 }
 
@@ -239,14 +240,12 @@ TEST(TokenText, WithoutTrustListsWhatDeviatesAndSaysWhatWasNotChecked) {
   EXPECT_THAT(TokenText(ViewWith({}, report), PLAIN), EndsWith(R"(
 Name:            alice
 
-Check  Outcome  What was found              What to do
+Check  Outcome  What was found                                What to do
 form   failed   Something is wrong.
-                Unexpected attribute: 'Id'  Ask for the accepted form.
-                at /Assertion
-                attribute Id
-                line 1, column 7
-                wanted: no such attribute
-                found: Id="x"
+                Unexpected attribute: 'Id'                    Ask for the accepted form.
+                  line 1, column 7: /Assertion, attribute Id
+                  wanted: no such attribute
+                  found: Id="x"
 
 The signature and the keys were not checked, because no trusted certificate was given.
 )"));
@@ -272,7 +271,7 @@ TEST(ReportText, ListsEachCheckWithItsOutcome) {
   EXPECT_THAT(text, HasSubstr("\nwell-formed            passed    As it should be.\n"));
   EXPECT_THAT(text, HasSubstr("\nkeys                   failed    Something is wrong.\n"));
   EXPECT_THAT(text, HasSubstr("\nsignature              not done  As it should be.\n"));
-  EXPECT_EQ(1 + 14 + 1 + 6, std::count(text.begin(), text.end(), '\n')); // headings, checks, findings
+  EXPECT_EQ(1 + 14 + 5 + 1, std::count(text.begin(), text.end(), '\n')); // headings, checks, two findings
 }
 
 TEST(ReportText, SaysByHowMuchAClockMissesAndHowManyFindingsAreLeftOut) {
@@ -281,8 +280,19 @@ TEST(ReportText, SaysByHowMuchAClockMissesAndHowManyFindingsAreLeftOut) {
   ResultOf(report, Check::VALIDITY).findings.front().missedBySec = 3660;
   ResultOf(report, Check::VALIDITY).unlistedFindings = 2;
   EXPECT_THAT(ReportText({report}, PLAIN), HasSubstr("  The token has expired\n"
-                                                     "                                 missed by 1 h 1 min\n"
-                                                     "                                 and 2 more findings\n"));
+                                                     "                                  missed by 1 h 1 min\n"
+                                                     "                                and 2 more findings\n"));
+}
+
+TEST(ReportText, SaysOnceWhatToDoAboutSeveralFindings) {
+  TokenReport report = Passed();
+  for (const char *message : {"One", "Two", "Three"}) {
+    Fail(report, Check::FORM, message);
+    ResultOf(report, Check::FORM).findings.back().remedy = std::string(message) == "Three" ? "Wait." : "Ask.";
+  }
+  EXPECT_THAT(ReportText({report}, PLAIN), HasSubstr("  One                  Ask.\n"
+                                                     "                                Two\n"
+                                                     "                                Three                Wait.\n"));
 }
 
 TEST(ReportText, HasColoursOnlyForOutcomesAndOnlyIfAsked) {
