@@ -119,9 +119,8 @@ void HandshakeRecord::NoteRefusal(X509_STORE_CTX *verification, std::string text
   refusal.text = std::move(text);
   refusal.depth = static_cast<std::size_t>(std::max(X509_STORE_CTX_get_error_depth(verification), 0));
   const X509 *const certificate = X509_STORE_CTX_get_current_cert(verification);
-  if (const Ref<const Crypto::Certificate> copy = certificate ? Copy(certificate) : nullptr) {
-    refusal.subject = copy->GetSubject();
-    refusal.issuer = copy->GetIssuer();
+  if (certificate) {
+    refusal.certificate = Copy(certificate);
   }
   AddRefusal(std::move(refusal));
 }

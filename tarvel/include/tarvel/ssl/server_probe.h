@@ -30,7 +30,7 @@ struct ServerRefusal {
     EXPIRED,         ///< a certificate is no longer valid
     NOT_YET_VALID,   ///< a certificate is not valid yet
     OTHER_NAME,      ///< the server's certificate is for other names
-    UNKNOWN_ISSUER,  ///< the context does not trust the issuer of the last certificate, and nobody issued that one
+    UNKNOWN_ISSUER,  ///< the issuer of the chain's last certificate is neither in the chain nor trusted
     SELF_SIGNED,     ///< the server's certificate, or the last one of its chain, is its own issuer and not trusted
     WEAK_KEY,        ///< a certificate's key is too short
     WEAK_SIGNATURE,  ///< a certificate is signed with a weak algorithm
@@ -40,9 +40,11 @@ struct ServerRefusal {
 
   Kind kind = Kind::OTHER;
   std::string text;      ///< in the words of an `SSLException`, without the endpoint
-  std::size_t depth = 0; ///< of the certificate in the chain; 0 is the server's
-  std::string subject;   ///< of that certificate; may be empty
-  std::string issuer;    ///< of that certificate; may be empty
+  std::size_t depth = 0; ///< of the certificate in the chain that was verified; 0 is the server's
+
+  /// That certificate, which need not be one of those that the server sent. Null for one that cannot be read, and for
+  /// `OTHER_THUMBPRINT`.
+  Ref<const Crypto::Certificate> certificate;
 };
 
 /// What a TLS handshake has shown. All texts and certificates are the server's, and nothing of them is verified unless
