@@ -54,6 +54,10 @@ constexpr Command COMMANDS[] = {
      "  ssoclient inspect token.xml\n"
      "  ssoclient inspect --format json - <token.xml\n",
      DefineInspect},
+    {"doctor", "Find out why a service cannot be used, without sending it any credential",
+     "  ssoclient doctor --sts https://sts.corp.example/sts --ca ca.pem --trust sts.pem\n"
+     "  ssoclient doctor --sts https://sts.corp.example/sts --timeout 5 --format json\n",
+     DefineDoctor},
 };
 
 /// The format that the command line asks for; works also for a command line that has errors.

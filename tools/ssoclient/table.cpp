@@ -93,7 +93,7 @@ void WriteRow(const Table::Row &row, const std::array<std::size_t, Table::COLUMN
       if (!text.empty()) {
         out.append(blanks, ' ');
         blanks = 0;
-        out += hasColours ? Coloured(text, row[column].colour) : text;
+        out += Coloured(text, row[column].colour, hasColours);
       }
       blanks += widths[column] - CountCharacters(text) + GAP;
     }

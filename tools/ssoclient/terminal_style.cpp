@@ -37,6 +37,8 @@ std::string_view CodeOf(Colour colour) noexcept {
     return "\033[31m";
   case Colour::YELLOW:
     return "\033[33m";
+  case Colour::BOLD:
+    return "\033[1m";
   case Colour::NONE:
     break;
   }
@@ -58,11 +60,11 @@ TextStyle ChooseStyle(const TerminalFacts &facts) noexcept {
   return style;
 }
 
-TextStyle StyleOfStandardOutput() noexcept {
+TextStyle StyleOf(int descriptor) noexcept {
   TerminalFacts facts;
-  facts.isTerminal = isatty(STDOUT_FILENO) == 1;
+  facts.isTerminal = isatty(descriptor) == 1;
   winsize size = {};
-  if (facts.isTerminal && ioctl(STDOUT_FILENO, TIOCGWINSZ, &size) == 0) {
+  if (facts.isTerminal && ioctl(descriptor, TIOCGWINSZ, &size) == 0) {
     facts.columns = size.ws_col;
   }
   facts.columnsVariable = std::getenv("COLUMNS");
@@ -71,9 +73,9 @@ TextStyle StyleOfStandardOutput() noexcept {
   return ChooseStyle(facts);
 }
 
-std::string Coloured(std::string_view text, Colour colour) {
+std::string Coloured(std::string_view text, Colour colour, bool hasColours) {
   const std::string_view code = CodeOf(colour);
-  if (code.empty() || text.empty()) {
+  if (!hasColours || code.empty() || text.empty()) {
     return std::string(text);
   }
   return std::string(code) + std::string(text) + "\033[0m";

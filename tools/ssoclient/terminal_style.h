@@ -10,10 +10,10 @@
 
 namespace SsoClient::Tool {
 
-/// The colours of text on a terminal.
-enum class Colour { NONE, GREEN, RED, YELLOW };
+/// The colours of text on a terminal, which are those of its own palette.
+enum class Colour { NONE, GREEN, RED, YELLOW, BOLD };
 
-/// What decides the layout of standard output.
+/// What decides the layout.
 struct TerminalFacts {
   bool isTerminal = false;
   std::size_t columns = 0;               ///< of the terminal; 0: not known
@@ -32,10 +32,11 @@ struct TextStyle {
 /// "dumb".
 TextStyle ChooseStyle(const TerminalFacts &facts) noexcept;
 
-/// The style for what is written to standard output.
-TextStyle StyleOfStandardOutput() noexcept;
+/// The style of what is written to the descriptor.
+TextStyle StyleOf(int descriptor) noexcept;
 
-/// `text` with the sequences that colour it, or unchanged if there is nothing to colour.
-std::string Coloured(std::string_view text, Colour colour);
+/// `text` with the sequences that colour it; unchanged if `hasColours` is false, or there is nothing to colour.
+/// @param text printable
+std::string Coloured(std::string_view text, Colour colour, bool hasColours);
 
 } // namespace SsoClient::Tool

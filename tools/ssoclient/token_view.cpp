@@ -7,6 +7,8 @@
 
 #include <utility>
 
+#include <unistd.h>
+
 namespace SsoClient::Tool {
 
 TokenView ViewOf(const SamlToken &token) {
@@ -34,7 +36,7 @@ TokenView InspectToken(std::string xml) {
 std::string Render(const TokenView &view, Format format) {
   std::string text = view.xml;
   if (format == Format::TEXT) {
-    text = TokenText(view, StyleOfStandardOutput());
+    text = TokenText(view, StyleOf(STDOUT_FILENO));
   }
   if (format == Format::JSON) {
     text = TokenJson(view);

@@ -96,14 +96,16 @@ TEST(ChooseStyle, KeepsTheWidthWithinItsLimits) {
 }
 
 TEST(Coloured, EndsTheColourAfterTheText) {
-  EXPECT_EQ("\033[32mpassed\033[0m", Coloured("passed", Colour::GREEN));
-  EXPECT_EQ("\033[31mfailed\033[0m", Coloured("failed", Colour::RED));
-  EXPECT_EQ("\033[33mnot done\033[0m", Coloured("not done", Colour::YELLOW));
+  EXPECT_EQ("\033[32mpassed\033[0m", Coloured("passed", Colour::GREEN, true));
+  EXPECT_EQ("\033[31mfailed\033[0m", Coloured("failed", Colour::RED, true));
+  EXPECT_EQ("\033[33mnot done\033[0m", Coloured("not done", Colour::YELLOW, true));
+  EXPECT_EQ("\033[1mname\033[0m", Coloured("name", Colour::BOLD, true));
 }
 
 TEST(Coloured, LeavesTextWithoutColourAndEmptyTextAlone) {
-  EXPECT_EQ("text", Coloured("text", Colour::NONE));
-  EXPECT_EQ("", Coloured("", Colour::RED));
+  EXPECT_EQ("text", Coloured("text", Colour::NONE, true));
+  EXPECT_EQ("", Coloured("", Colour::RED, true));
+  EXPECT_EQ("text", Coloured("text", Colour::RED, false));
 }
 
 } // namespace
