@@ -4,7 +4,6 @@
 
 #include "operation/caught_exception.h"
 
-#include <ssoclient/create_saml_token.h>
 #include <ssoclient/exceptions.h>
 #include <tarvel/xml/parser.h>
 #include <tarvel/xml/security/signature.h>
@@ -13,11 +12,11 @@ namespace SsoClient {
 
 ReturnedTokens::ReturnedTokens(const Tarvel::Crypto::CertificateList &trustedCertificates,
                                const ServiceOptions &options)
-    : m_trustedCertificates(trustedCertificates), m_options(options.verifyOptions), m_sink(options.refusedTokenSink) {}
+    : m_verifier(trustedCertificates, options.verifyOptions), m_sink(options.refusedTokenSink) {}
 
 std::shared_ptr<const SamlToken> ReturnedTokens::Verify(const std::string &xml, OperationEvents &events) const {
   try {
-    return CreateSamlToken(xml, m_trustedCertificates, m_options.clockToleranceSec);
+    return m_verifier.Verify(xml);
   } catch (const InvalidTokenException &) {
     HandOver(xml, events);
     throw;

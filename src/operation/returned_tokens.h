@@ -8,6 +8,7 @@
 
 #include <ssoclient/saml_token.h>
 #include <ssoclient/service_options.h>
+#include <ssoclient/token_verifier.h>
 #include <tarvel/crypto/certificate.h>
 
 #include <memory>
@@ -29,8 +30,7 @@ public:
 private:
   void HandOver(const std::string &xml, OperationEvents &events) const noexcept;
 
-  Tarvel::Crypto::CertificateList m_trustedCertificates;
-  VerifyOptions m_options;
+  TokenVerifier m_verifier;
   ServiceOptions::RefusedTokenSink m_sink;
 };
 

@@ -5,6 +5,7 @@
 
 #include "support/recorded_log.h"
 #include "support/throws_message.h"
+#include "support/token_stand_in.h"
 
 #include <ssoclient/exceptions.h>
 
@@ -204,6 +205,43 @@ TEST(EchoedPassword, OfOneCharacterIsMaskedEverywhere) {
   EXPECT_THROW(service->AcquireToken("alice", "x", SpecFor(60)), SsoException);
   EXPECT_EQ(observer->LastFault().text, "a***b");
   EXPECT_EQ(observer->LastFault().codeName, "***");
+}
+
+// Whatever the text of a token looks like: the caller may have an implementation of its own.
+TEST(EchoedToken, IsMaskedAsTheOperationGotIt) {
+  const TokenStandIn token("_1", "token text", SamlToken::HOLDER_OF_KEY);
+  const std::function<void(const SecurityTokenService &)> operations[] = {
+      [&](const SecurityTokenService &service) { service.AcquireTokenByToken(token, SpecFor(60)); },
+      [&](const SecurityTokenService &service) { service.ValidateSubject(token); },
+      [&](const SecurityTokenService &service) { service.RenewToken(token, 60); }};
+  for (const auto &run : operations) {
+    const auto observer = std::make_shared<RecordedEvents>();
+    ServiceOptions options;
+    options.observer = observer;
+    const SecurityTokenServiceImpl service(
+        std::make_shared<const RequestBuilderStandIn>(),
+        std::make_shared<TransportStandIn>([](const Request &) { return "fault:not [token text]"; }),
+        std::make_shared<const ResponseHandlerStandIn>(), TrustedCertificates(), options);
+    EXPECT_THROW(run(service), InvalidCredentialsException);
+    EXPECT_EQ(observer->Lines().back(), "ended InvalidCredentialsException: not [***]");
+  }
+}
+
+// Verification may quote a value of the refused token.
+TEST(RefusedToken, IsMaskedInTheMessageOfItsRefusal) {
+  const auto observer = std::make_shared<RecordedEvents>();
+  ServiceOptions options;
+  options.observer = observer;
+  const std::string token = ReadDataFile("tokens/bearer.xml");
+  const std::string digest = Between(token, "DigestValue>", "<").front();
+  const std::string wrong = Replaced(token, "http://www.w3.org/2001/04/xmldsig-more#rsa-sha256", digest);
+  const SecurityTokenServiceImpl service(
+      std::make_shared<const RequestBuilderStandIn>(),
+      std::make_shared<TransportStandIn>([&](const Request &) { return "issued:" + wrong; }),
+      std::make_shared<const ResponseHandlerStandIn>(), TrustedCertificates(), options);
+  EXPECT_THROW(service.AcquireTokenByCertificate(SpecFor(60)), SsoException);
+  EXPECT_EQ(observer->Lines().back(), "ended InvalidSignatureException: Signature verification error. The signature "
+                                      "algorithm \"***\" is not accepted");
 }
 
 // A code is divided at its colon, and an exception quotes its prefix alone.
