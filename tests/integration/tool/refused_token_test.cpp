@@ -4,6 +4,7 @@
 #include "expect_result.h"
 #include "refusals.h"
 #include "service_test.h"
+#include "terminal.h"
 
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
@@ -91,6 +92,19 @@ TEST_F(SaveRefused, DoesNotReplaceAFileWithoutForce) {
   EXPECT_EQ("", m_service.GetLog());
   EXPECT_EQ(6, Run(Line() + "--force").exitCode);
   EXPECT_THAT(m_folder.Read("refused.xml"), HasSubstr(":Assertion "));
+}
+
+TEST_F(SaveRefused, DoesNotReplaceAFileThatAppearsDuringTheRun) {
+  TerminalSession session(ShellCommand("exec ssoclient acquire " + Service("wrong-signer") +
+                                       "--user alice@corp.example --save-refused refused.xml"),
+                          m_folder.Path());
+  session.WaitFor("Password for alice@corp.example: "); // by then the tool has seen that there is no such file
+  m_folder.Write("refused.xml", "from another program");
+  session.Type("wonderland\n");
+  EXPECT_EQ(6, session.Finish());
+  EXPECT_THAT(session.Shown(), HasSubstr("ssoclient: warning: the refused token could not be saved: refused.xml: "
+                                         "already exists; --force replaces it\r\n"));
+  EXPECT_EQ("from another program", m_folder.Read("refused.xml"));
 }
 
 TEST_F(SaveRefused, WritesNoFileWhenNoTokenIsRefused) {

@@ -107,6 +107,12 @@ TEST(Table, GivesAColumnWhatTheOtherOneDoesNotNeed) {
             table.Write(Plain(60)));
 }
 
+TEST(Table, AlignsCharactersOfSeveralOctets) {
+  Table table({"A", "B", "C", "D"});
+  table.Add({Cell{"\xC3\xA9\xC3\xA9"}, Cell{"b"}, Cell{"\xF0\x9F\x99\x82x"}, Cell{"d"}});
+  EXPECT_EQ("A   B  C   D\n\xC3\xA9\xC3\xA9  b  \xF0\x9F\x99\x82x  d\n", table.Write(Plain(60)));
+}
+
 TEST(Table, ColoursOnlyWhenTheStyleHasColours) {
   const std::string coloured = Sample().Write({200, true});
   EXPECT_NE(std::string::npos, coloured.find("form         \033[31mfailed\033[0m   one two"));
