@@ -12,7 +12,16 @@ using Check = TokenReport::Check;
 using Finding = TokenReport::Finding;
 using NamedCertificate = TokenReport::NamedCertificate;
 
-constexpr const char *SEND_UNCHANGED = "Use the token exactly as the service sent it: not even its layout may change.";
+std::string ForForm(const Finding &finding) {
+  if (finding.wanted == "element ds:Signature") {
+    return "Ask the service's operator to sign the assertion, with the Signature element after the Issuer.";
+  }
+  if (finding.message == TOKEN_NOT_COVERED) {
+    return "Ask the service's operator to sign the whole assertion.";
+  }
+  return "Ask the service's operator to issue tokens of the accepted form, and make sure that nothing changes them on their "
+         "way.";
+}
 
 std::string ForIdentifiers(const Finding &finding) {
   return finding.attribute == "Version" ? "Ask the service's operator to issue SAML 2.0 tokens."
@@ -74,7 +83,7 @@ std::string ForSignature(const TokenReport &report) {
   const bool isNamed = std::any_of(report.trustedKeys.begin(), report.trustedKeys.end(),
                                    [](const TokenReport::TrustedKey &key) { return key.isNamed; });
   if (isNamed && !report.namedCertificates.empty() && !FindStranger(report)) {
-    return SEND_UNCHANGED;
+    return "Use the token exactly as the service sent it: not even its layout may change.";
   }
   return ForMissingKey(report) +
          " If it is given already, the token was changed: " + "use it exactly as the service sent it.";
@@ -118,7 +127,7 @@ std::string RemedyFor(const TokenReport &report, Check check, const Finding &fin
   case Check::SIGNATURE:
     return ForSignature(report);
   case Check::DIGESTS:
-    return SEND_UNCHANGED;
+    return "Use the token exactly as the service sent it: not even its layout may change.";
   case Check::NAMES:
     return "Ask the service's operator to issue names of the form name@domain, groups of the form domain\\group, and "
            "at "

@@ -5,7 +5,6 @@
 #include "xml/form_text.h"
 #include "xml/refuse.h"
 
-#include <tarvel/core/exception.h>
 #include <tarvel/core/string_util.h>
 
 #include <boost/lexical_cast.hpp>
@@ -54,9 +53,7 @@ bool Contains(const Names &names, const Name &name) {
 
 void ReadDate(const ElementNode &element, std::string_view name, std::string_view text, Tarvel::System::DateTime &date,
               DeviationSink &sink) {
-  try {
-    date = Tarvel::System::DateTime(text);
-  } catch (const Tarvel::DateTimeFormatException &) {
+  if (!Tarvel::System::DateTime::TryParse(text, date)) {
     Refuse(sink, {element, name}, "a date of the form xsd:dateTime", text, "%1/@%2 is not a date", element.GetName(),
            name);
   }
@@ -160,7 +157,7 @@ bool RequireTextualContent(NodeFilterIterator iterator, std::string &text, Devia
   NodeFilterIterator content = iterator.GetChild();
   const Tarvel::Xml::TextNode *const textNode = Tarvel::Xml::AsText(content.node);
   if (!textNode || content.MoveToSibling().node) {
-    Refuse(sink, iterator, "text", WhatIsAt{content.node},
+    Refuse(sink, iterator, "one text", WhatIsAt{content.node},
            "Element '%1' must only have textual content (but has extra children or is empty).", NameOf(element));
     return false;
   }
