@@ -2,6 +2,8 @@
 
 #include "token/report_remedies.h"
 
+#include "token/token_signature.h"
+
 #include <algorithm>
 
 namespace SsoClient {
@@ -19,8 +21,8 @@ std::string ForForm(const Finding &finding) {
   if (finding.message == TOKEN_NOT_COVERED) {
     return "Ask the service's operator to sign the whole assertion.";
   }
-  return "Ask the service's operator to issue tokens of the accepted form, and make sure that nothing changes them on their "
-         "way.";
+  return "Ask the service's operator to issue tokens of the accepted form, and make sure that nothing changes them on "
+         "their way.";
 }
 
 std::string ForIdentifiers(const Finding &finding) {
@@ -39,16 +41,6 @@ std::string ForValidity(const Finding &finding) {
   }
   return "Get a new token. If this one is new, synchronise this machine's clock (it seems at least " + seconds +
          " s ahead), or the service's.";
-}
-
-std::string ForDelegation() {
-  return "Ask the service's operator to issue delegated tokens whose confirmation names the last delegate.";
-}
-
-std::string ForAlgorithms() {
-  return "Ask the service's operator to sign with accepted algorithms, such as RSA with SHA-256, digests with SHA-256 "
-         "and "
-         "exclusive canonicalization.";
 }
 
 const NamedCertificate *FindStranger(const TokenReport &report) {
@@ -83,10 +75,11 @@ std::string ForSignature(const TokenReport &report) {
   const bool isNamed = std::any_of(report.trustedKeys.begin(), report.trustedKeys.end(),
                                    [](const TokenReport::TrustedKey &key) { return key.isNamed; });
   if (isNamed && !report.namedCertificates.empty() && !FindStranger(report)) {
-    return "Use the token exactly as the service sent it: not even its layout may change.";
+    return "Use the token exactly as the service sent it. If it is unchanged, it may be forged: it names a trusted "
+           "certificate whose key did not make its signature.";
   }
   return ForMissingKey(report) +
-         " If it is given already, the token was changed: " + "use it exactly as the service sent it.";
+         " If it is given already, the token was changed: use it exactly as the service sent it.";
 }
 
 std::string ForAudience(const Finding &finding) {
@@ -106,9 +99,7 @@ std::string RemedyFor(const TokenReport &report, Check check, const Finding &fin
   case Check::WELL_FORMED:
     return "Use the whole token exactly as the service sent it, as XML in UTF-8.";
   case Check::FORM:
-    return "Ask the service's operator to issue tokens of the accepted form, and make sure that nothing changes them "
-           "on "
-           "their way.";
+    return ForForm(finding);
   case Check::IDENTIFIERS:
     return ForIdentifiers(finding);
   case Check::VALIDITY:
@@ -116,9 +107,11 @@ std::string RemedyFor(const TokenReport &report, Check check, const Finding &fin
   case Check::CONFIRMATION:
     return "Ask the service's operator to let the confirmation of bearer tokens last as long as the token.";
   case Check::DELEGATION:
-    return ForDelegation();
+    return "Ask the service's operator to issue delegated tokens whose confirmation names the last delegate.";
   case Check::ALGORITHMS:
-    return ForAlgorithms();
+    return "Ask the service's operator to sign with accepted algorithms, such as RSA with SHA-256, digests with "
+           "SHA-256 "
+           "and exclusive canonicalization.";
   case Check::KEYS:
     return ForKeys(report);
   case Check::REFERENCES:

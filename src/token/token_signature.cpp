@@ -96,7 +96,7 @@ void ParseTokenSignature(NodeFilterIterator &iterator, const ElementNode &assert
   }
   if (signature && !CoversAssertion(*signature, GetTextAttribute(assertion, "ID"))) {
     Refuse(sink, iterator, "a reference to the assertion's ID, or to the whole document", UrisOf{signature.get()},
-           "Token's signature must cover the entire token");
+           TOKEN_NOT_COVERED);
   }
   iterator.MoveToSibling();
 }

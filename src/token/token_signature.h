@@ -11,7 +11,12 @@
 #include <tarvel/xml/node.h>
 #include <tarvel/xml/security/signature.h>
 
+#include <string_view>
+
 namespace SsoClient {
+
+/// The text with which a signature of anything else than the token is refused.
+constexpr std::string_view TOKEN_NOT_COVERED = "Token's signature must cover the entire token";
 
 /// Reads the signature at the cursor, a child of `assertion`, and moves the cursor to the next node. The signature is not
 /// verified yet, but one of its references must be to `assertion` or to the whole document.

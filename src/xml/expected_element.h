@@ -1,9 +1,9 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// Reading lists of child elements in the order of the accepted form, and finding the way back after a deviation.
+/// Reading lists of child elements in the order of the accepted form, and finding the next element after a deviation.
 ///
-/// All functions take the time of one look at the list at most. A parser takes each name of a sequence once, so it reads
-/// every document in linear time.
+/// Each call examines each node of the list at most twice. A parser takes each name of a sequence once, so it reads every
+/// document in linear time.
 
 #pragma once
 

@@ -79,7 +79,7 @@ TEST(AssertionRecovery, ReadsAForeignAssertion) {
   EXPECT_EQ(2u, assertion.AttributeStatement->attributes.size());
 }
 
-TEST(AssertionRecovery, TellsWhereNamesAndAttributesAre) {
+TEST(AssertionRecovery, HasThePlacesOfNamesAndAttributes) {
   const RecoveredAssertion recovered(BearerAssertion());
   const SamlAssertionType &assertion = recovered.record;
   const auto nameOf = [](const Tarvel::Xml::ElementNode *element) { return std::string(element->GetName()); };

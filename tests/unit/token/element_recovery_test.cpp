@@ -189,7 +189,7 @@ TEST(ConditionsRecovery, ReadsTheOtherDate) {
   EXPECT_EQ(DateTime("2026-01-01T07:00:00Z"), recovered.record.Conditions.NotOnOrAfter);
 }
 
-TEST(ConditionsRecovery, ReportsADateThatIsNotOneOnce) {
+TEST(ConditionsRecovery, ReportsADateOfAnotherFormOnce) {
   const RecoveredAssertion recovered = Recover(" NotBefore=\"2026-01-01T00:00:00Z\"", " NotBefore=\"now\"");
   EXPECT_EQ((Messages{"saml:Conditions/@NotBefore is not a date | saml:Conditions"}), recovered.Messages());
   EXPECT_EQ(DateTime(), recovered.record.Conditions.NotBefore);

@@ -68,8 +68,7 @@ TEST_F(ExplainSignatureTest, NamesTheKeyThatMadeTheSignature) {
 }
 
 TEST_F(ExplainSignatureTest, FindsTheSecondTrustedKeyWithoutKeyInfo) {
-  const TokenReport report =
-      ExplainWith(TokenCertificates({"other", "sts-rsa"}), SignAgain(TokenFixture("bearer")));
+  const TokenReport report = ExplainWith(TokenCertificates({"other", "sts-rsa"}), SignAgain(TokenFixture("bearer")));
   EXPECT_EQ("", NotPassed(report));
   EXPECT_TRUE(report.namedCertificates.empty());
   EXPECT_FALSE(report.trustedKeys.at(0).madeSignature);
@@ -90,17 +89,19 @@ TEST_F(ExplainSignatureTest, AStrangersCertificateIsNamedButNotUsed) {
   EXPECT_EQ("No trusted key made the signature.", report.Get(Check::SIGNATURE).summary);
   const TokenReport::Finding finding = OnlyFinding(report, Check::SIGNATURE);
   EXPECT_EQ("/saml:Assertion/ds:Signature/ds:SignatureValue", finding.path);
-  EXPECT_EQ("Give the certificate of the service that issued the token; the signature names " + stranger +
-                ". Compare it with what the service's operator says before you trust it. If it is given already, the token "
-                "was changed: use it exactly as the service sent it.",
-            finding.remedy);
+  EXPECT_EQ(
+      "Give the certificate of the service that issued the token; the signature names " + stranger +
+          ". Compare it with what the service's operator says before you trust it. If it is given already, the token "
+          "was changed: use it exactly as the service sent it.",
+      finding.remedy);
 }
 
 TEST_F(ExplainSignatureTest, WithoutKeyInfoTheCertificateIsAskedFor) {
   const TokenReport report = ExplainWith(TokenCertificates({"other"}), SignAgain(TokenFixture("bearer")));
-  EXPECT_EQ("Give the certificate of the service that issued the token. If it is given already, the token was changed: use "
-            "it exactly as the service sent it.",
-            OnlyFinding(report, Check::SIGNATURE).remedy);
+  EXPECT_EQ(
+      "Give the certificate of the service that issued the token. If it is given already, the token was changed: use "
+      "it exactly as the service sent it.",
+      OnlyFinding(report, Check::SIGNATURE).remedy);
 }
 
 TEST_F(ExplainSignatureTest, ASignatureThatOnlyClaimsATrustedCertificateMayBeForged) {
@@ -122,9 +123,10 @@ TEST_F(ExplainSignatureTest, WithoutATrustedKeyTheCertificateIsAskedFor) {
   EXPECT_EQ("Signature verification error. No trusted key can be used with the signature algorithm "
             "\"http://www.w3.org/2001/04/xmldsig-more#rsa-sha256\"",
             report.refusal);
-  EXPECT_EQ("Give the certificate of the service that issued the token; the signature names CN=sts,O=Example (SHA-256 " +
-                ThumbprintOf("sts-rsa") + "). Compare it with what the service's operator says before you trust it.",
-            OnlyFinding(report, Check::KEYS).remedy);
+  EXPECT_EQ(
+      "Give the certificate of the service that issued the token; the signature names CN=sts,O=Example (SHA-256 " +
+          ThumbprintOf("sts-rsa") + "). Compare it with what the service's operator says before you trust it.",
+      OnlyFinding(report, Check::KEYS).remedy);
   EXPECT_EQ("No key could be tried.", report.Get(Check::SIGNATURE).summary);
   EXPECT_TRUE(report.trustedKeys.empty());
 }
@@ -133,51 +135,57 @@ TEST_F(ExplainSignatureTest, AKeyThatDoesNotFitTheAlgorithmCannotBeUsed) {
   const TokenReport report = ExplainWith(TokenCertificates({"sts-ec256"}), SignAgain(TokenFixture("bearer")));
   EXPECT_EQ("keys failed, signature not done", NotPassed(report));
   EXPECT_EQ("0 of 1 trusted keys can be used with the signature.", report.Get(Check::KEYS).summary);
-  EXPECT_EQ("Trust a certificate whose key fits the signature's algorithm: RSA of at least 2048 bits, or P-256, P-384 or "
-            "P-521 for ECDSA.",
-            OnlyFinding(report, Check::KEYS).remedy);
+  EXPECT_EQ(
+      "Trust a certificate whose key fits the signature's algorithm: RSA of at least 2048 bits, or P-256, P-384 or "
+      "P-521 for ECDSA.",
+      OnlyFinding(report, Check::KEYS).remedy);
 }
 
 TEST_F(ExplainSignatureTest, AnAlgorithmThatIsNotAcceptedLeavesNoKeyToTry) {
   const TokenReport report = Explain(Attack("method-rsa-sha1"));
   EXPECT_EQ("algorithms failed, keys not done, signature not done", NotPassed(report));
-  EXPECT_EQ("Signature verification error. The signature algorithm \"http://www.w3.org/2000/09/xmldsig#rsa-sha1\" is not "
-            "accepted",
-            report.refusal);
+  EXPECT_EQ(
+      "Signature verification error. The signature algorithm \"http://www.w3.org/2000/09/xmldsig#rsa-sha1\" is not "
+      "accepted",
+      report.refusal);
   EXPECT_EQ("http://www.w3.org/2000/09/xmldsig#rsa-sha1", report.signatureAlgorithm);
   const TokenReport::Finding finding = OnlyFinding(report, Check::ALGORITHMS);
   EXPECT_EQ("ds:SignatureMethod", finding.element);
   EXPECT_EQ("http://www.w3.org/2000/09/xmldsig#rsa-sha1", finding.found);
-  EXPECT_EQ("Ask the service's operator to sign with accepted algorithms, such as RSA with SHA-256, digests with SHA-256 "
-            "and exclusive canonicalization.",
-            finding.remedy);
+  EXPECT_EQ(
+      "Ask the service's operator to sign with accepted algorithms, such as RSA with SHA-256, digests with SHA-256 "
+      "and exclusive canonicalization.",
+      finding.remedy);
 }
 
 TEST_F(ExplainSignatureTest, AReferenceToSeveralElementsDoesNotResolve) {
   const TokenReport report = Explain(Attack("duplicate-ID-in-keyinfo"));
   EXPECT_EQ("references failed, digests not done", NotPassed(report));
-  EXPECT_EQ("Signature verification error. The reference URI \"#_2454ad61-c2ac-c04f-0a20-fabf7f2bc96f\" is not accepted: "
-            "several elements have that identifier",
-            report.refusal);
+  EXPECT_EQ(
+      "Signature verification error. The reference URI \"#_2454ad61-c2ac-c04f-0a20-fabf7f2bc96f\" is not accepted: "
+      "several elements have that identifier",
+      report.refusal);
   EXPECT_EQ("0 of 1 references resolve.", report.Get(Check::REFERENCES).summary);
   EXPECT_EQ("Not all digests could be computed.", report.Get(Check::DIGESTS).summary);
-  EXPECT_EQ("Ask the service's operator to sign the assertion by its ID, and use the token in a document where no other "
-            "element has that ID.",
-            OnlyFinding(report, Check::REFERENCES).remedy);
+  EXPECT_EQ(
+      "Ask the service's operator to sign the assertion by its ID, and use the token in a document where no other "
+      "element has that ID.",
+      OnlyFinding(report, Check::REFERENCES).remedy);
   EXPECT_FALSE(report.references.at(0).resolves);
   EXPECT_FALSE(report.references.at(0).coversToken);
   EXPECT_EQ("", report.references.at(0).target);
 }
 
 TEST_F(ExplainSignatureTest, AChangedTokenHasAnotherDigest) {
-  const TokenReport report = Explain(ReplaceOnce(TokenFixture("bearer"), ">alice@corp.example<", ">mallory@corp.example<"));
+  const TokenReport report =
+      Explain(ReplaceOnce(TokenFixture("bearer"), ">alice@corp.example<", ">mallory@corp.example<"));
   EXPECT_EQ("digests failed", NotPassed(report));
   EXPECT_EQ(TAMPERED, report.refusal);
   const TokenReport::Finding finding = OnlyFinding(report, Check::DIGESTS);
   const TokenReport::Reference &reference = report.references.at(0);
   EXPECT_EQ("/saml:Assertion/ds:Signature/ds:SignedInfo/ds:Reference/ds:DigestValue", finding.path);
-  EXPECT_EQ(reference.digestWanted, finding.found);
-  EXPECT_EQ(reference.digestComputed, finding.wanted);
+  EXPECT_EQ(reference.digestWanted, finding.wanted);
+  EXPECT_EQ(reference.digestComputed, finding.found);
   EXPECT_NE(reference.digestWanted, reference.digestComputed);
   EXPECT_FALSE(reference.digestMatches);
   EXPECT_EQ("0 of 1 digests match.", report.Get(Check::DIGESTS).summary);
@@ -194,8 +202,9 @@ TEST_F(ExplainSignatureTest, AReferenceToTheDocumentCoversTheToken) {
 
 TEST_F(ExplainSignatureTest, WithoutASignatureNothingAboutItIsDone) {
   const TokenReport report = Explain(Attack("unsigned"));
-  EXPECT_EQ("form failed, algorithms not done, keys not done, references not done, signature not done, digests not done",
-            NotPassed(report));
+  EXPECT_EQ(
+      "form failed, algorithms not done, keys not done, references not done, signature not done, digests not done",
+      NotPassed(report));
   EXPECT_EQ("There is no signature that can be read.", report.Get(Check::KEYS).summary);
   EXPECT_EQ("Ask the service's operator to sign the assertion, with the Signature element after the Issuer.",
             OnlyFinding(report, Check::FORM).remedy);

@@ -24,8 +24,7 @@ protected:
   }
 
 private:
-  Tarvel::ScopedEnvironment m_clock{
-      {[] { return Tarvel::System::DateTime("2026-01-02T03:04:05Z").GetUtcTime(); }, {}}};
+  Tarvel::ScopedEnvironment m_clock{{[] { return Tarvel::System::DateTime("2026-01-02T03:04:05Z").GetUtcTime(); }, {}}};
 };
 
 /// The names of the checks that did not pass, such as "validity failed, names not done".

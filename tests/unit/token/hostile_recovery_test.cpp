@@ -1,5 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
-// A document of a million deviations: the parser looks at each node a limited number of times, and makes only the texts for
+// A document of a million deviations: the parser examines each node a limited number of times, and makes only the texts for
 // which the sink has space. RecordedDeviations checks the latter. A parser that takes quadratic time would need hours.
 #include "support/parsed_document.h"
 #include "support/recorded_deviations.h"
@@ -75,7 +75,7 @@ TEST(HostileAssertion, HasAMillionElementsInsteadOfItsOwn) {
   EXPECT_EQ(MANY + 5, CountDeviations(children, Many("<x/>")));
 }
 
-TEST(HostileAssertion, HasManyDatesThatAreNone) {
+TEST(HostileAssertion, HasManyDatesOfAnotherForm) {
   const std::size_t dates = MANY / 4;
   EXPECT_EQ(2 * dates, CountDeviations(Piece::DELEGATES, Many("<del:Delegate DelegationInstant=\"\"/>", dates)));
 }

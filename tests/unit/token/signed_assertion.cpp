@@ -76,7 +76,8 @@ std::string SignAgain(const std::string &token, const SigningChoices &choices) {
       SignedInfo(choices.reference.empty() ? "#" + id : choices.reference,
                  choices.digest.empty() ? StringUtil::Base64Encode(digest.data(), digest.size()) : choices.digest);
   const std::string declaration = " xmlns:ds=\"" + std::string(NAMESPACE) + "\"";
-  const std::string standalone = "<ds:SignedInfo" + declaration + signedInfo.substr(std::string("<ds:SignedInfo").size());
+  const std::string standalone =
+      "<ds:SignedInfo" + declaration + signedInfo.substr(std::string("<ds:SignedInfo").size());
   const auto key = Tarvel::Crypto::CreatePrivateKey(ReadDataFile("tokens/" + choices.key + ".key"));
   const auto value = Tarvel::Crypto::SignDigest(*key, Tarvel::Crypto::SignatureScheme::RSA_PKCS1,
                                                 DigestAlgorithm::SHA256, CanonicalDigest(standalone).data());

@@ -44,7 +44,7 @@ TEST(AttributesOfNames, ListsQualifiedNames) {
             MessageFormatter::ASPrint("%1", Names{{XSI_TYPE, QNameView("urn:a", "b")}, {LocalName("Count")}}));
 }
 
-TEST(WhatIsAt, SaysTheKindOfTheNode) {
+TEST(WhatIsAt, StatesTheKindOfTheNode) {
   const ParsedDocument document("<a:r xmlns:a='urn:a'>text<?pi?></a:r>");
   const Tarvel::Xml::Node *const text = document.Root().GetFirstChild();
   EXPECT_EQ("element a:r", MessageFormatter::ASPrint("%1", WhatIsAt{&document.Root()}));

@@ -104,7 +104,7 @@ TEST(NodeFilterIterator, StartsAtItsFirstNodeEvenIfTheFilterHidesIt) {
   EXPECT_EQ(document.Root().GetFirstChild(), iterator.node);
 }
 
-TEST(NodeFilterIterator, KnowsTheParentAlsoPastTheEnd) {
+TEST(NodeFilterIterator, HasTheParentAlsoPastTheEnd) {
   const ParsedDocument document("<r><e/></r>");
   NodeFilterIterator iterator = document.Cursor();
   EXPECT_EQ(document.Root().GetParent(), iterator.parent);
