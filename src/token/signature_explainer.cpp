@@ -130,10 +130,10 @@ public:
         std::find_if(keys.begin(), keys.end(), [](const TokenReport::TrustedKey &key) { return key.madeSignature; });
     if (signer != keys.end()) {
       m_recorder.Summarize("Signed by " + NameOf(signer->subject, signer->thumbprint) + ".");
-    } else if (m_signature.isValueChecked) {
-      m_recorder.Summarize("No trusted key made the signature.");
     } else {
-      m_recorder.SetNotDone("No key could be tried.");
+      // There is no refusal of the value if none of the keys that KeyInfo selects can be used; other keys are tried only
+      // for the report.
+      m_recorder.SetNotDone(m_signature.isValueChecked ? "No trusted key made the signature." : "No key could be tried.");
     }
   }
 

@@ -35,9 +35,8 @@ void TakeGroups(AttributeType &attribute, TokenFacts &facts, DeviationSink &sink
     facts.groups.reserve(attribute.values.size());
   }
   for (std::string &value : attribute.values) {
-    PrincipalId group;
-    if (ParseGroupIdentity(std::move(value), group, attribute.element, sink)) {
-      facts.groups.push_back(std::move(group));
+    if (!ParseGroupIdentity(std::move(value), facts.groups.emplace_back(), attribute.element, sink)) {
+      facts.groups.pop_back();
     }
   }
 }
@@ -123,7 +122,7 @@ PrincipalId ParseGroupIdentity(std::string value) {
   return group;
 }
 
-bool ParseGroupIdentity(std::string value, PrincipalId &group, const Tarvel::Xml::ElementNode *place,
+bool ParseGroupIdentity(std::string &&value, PrincipalId &group, const Tarvel::Xml::ElementNode *place,
                         DeviationSink &sink) {
   const std::size_t backslash = value.find('\\');
   if (!HasBothSides(value, backslash)) {
@@ -131,7 +130,7 @@ bool ParseGroupIdentity(std::string value, PrincipalId &group, const Tarvel::Xml
            value);
     return false;
   }
-  group.domain = value.substr(0, backslash);
+  group.domain.assign(value, 0, backslash);
   value.erase(0, backslash + 1);
   group.name = std::move(value);
   return true;

@@ -79,7 +79,7 @@ Delegate ParseToDelegate(const DelegateType &delegate);
 /// The same functions for a sink that may not throw. They return whether the value could be read. If not, they report why and
 /// do not change the name or the flag.
 /// @param place where the group is; may be null
-bool ParseGroupIdentity(std::string value, PrincipalId &group, const Tarvel::Xml::ElementNode *place,
+bool ParseGroupIdentity(std::string &&value, PrincipalId &group, const Tarvel::Xml::ElementNode *place,
                         DeviationSink &sink);
 bool ParseSamlNameId(const NameIDType &nameId, PrincipalId &principal, DeviationSink &sink);
 bool ParseIsSolutionAttribute(const AttributeType &attribute, bool &isSolution, DeviationSink &sink);

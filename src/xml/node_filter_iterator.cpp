@@ -55,8 +55,4 @@ NodeFilterIterator NodeFilterIterator::GetChild() const {
   return child;
 }
 
-const Tarvel::Xml::ElementNode *IteratorToElement(const NodeFilterIterator &iterator) noexcept {
-  return Tarvel::Xml::AsElement(iterator.node);
-}
-
 } // namespace SsoClient

@@ -55,6 +55,8 @@ public:
 };
 
 /// The element at the cursor; null past the end and at a node of another kind.
-const Tarvel::Xml::ElementNode *IteratorToElement(const NodeFilterIterator &iterator) noexcept;
+inline const Tarvel::Xml::ElementNode *IteratorToElement(const NodeFilterIterator &iterator) noexcept {
+  return Tarvel::Xml::AsElement(iterator.node);
+}
 
 } // namespace SsoClient

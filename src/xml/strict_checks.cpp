@@ -152,7 +152,7 @@ void RequireElementAttributesQNames(const ElementNode &element, std::initializer
   }
 }
 
-bool RequireTextualContent(NodeFilterIterator iterator, std::string &text, DeviationSink &sink) {
+bool RequireTextualContent(const NodeFilterIterator &iterator, std::string &text, DeviationSink &sink) {
   const ElementNode *const element = IteratorToElement(iterator);
   NodeFilterIterator content = iterator.GetChild();
   const Tarvel::Xml::TextNode *const textNode = Tarvel::Xml::AsText(content.node);

@@ -60,7 +60,7 @@ void RequireElementAttributesQNames(const Tarvel::Xml::ElementNode &element, std
 /// The element at the cursor must contain one text and nothing else. Two texts with a comment between them are refused, so
 /// that a comment cannot cut off a part of a value. White space at either end is the exception: if a comment separates
 /// it from the rest, the cursor does not show it. Returns whether `text` was set.
-bool RequireTextualContent(NodeFilterIterator iterator, std::string &text, DeviationSink &sink = ThrowingSink());
+bool RequireTextualContent(const NodeFilterIterator &iterator, std::string &text, DeviationSink &sink = ThrowingSink());
 
 /// The value of an attribute without a prefix; empty when there is no such attribute.
 std::string_view GetTextAttribute(const Tarvel::Xml::ElementNode &element, std::string_view name) noexcept;

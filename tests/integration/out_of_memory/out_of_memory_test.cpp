@@ -5,9 +5,12 @@
 #include "support/completion.h"
 #include "support/data_file.h"
 #include "support/dev_sts.h"
+#include "support/fixed_environment.h"
+#include "support/report_texts.h"
 
 #include <ssoclient/create_saml_token.h>
 #include <ssoclient/exceptions.h>
+#include <ssoclient/token_verifier.h>
 #include <tarvel/core/exception.h>
 #include <tarvel/crypto/certificate.h>
 #include <tarvel/crypto/private_key.h>
@@ -151,6 +154,27 @@ TEST_F(OutOfMemory, IsReportedByVerificationOnTheFirstUseOfAKey) {
   const std::string pem = ReadDataFile("tokens/sts-rsa.crt");
   const std::string xml = Token("bearer");
   ExpectNothingElse([&] { SsoClient::CreateSamlToken(xml, {Tarvel::Crypto::CreateCertificateFromPem(pem)}); });
+}
+
+/// Fails if a report that is returned is not the whole one.
+std::function<void()> Explanation(const std::string &file, const std::string &certificate) {
+  const SsoClient::TokenVerifier verifier(Tarvel::Crypto::LoadCertificates(DataPath("tokens/" + certificate + ".crt")));
+  const std::string xml = ReadDataFile(file);
+  const std::string whole = Testing::DescribeReport(verifier.Explain(xml));
+  return [xml, verifier, whole] {
+    if (Testing::DescribeReport(verifier.Explain(xml)) != whole) {
+      throw std::logic_error("another report");
+    }
+  };
+}
+
+TEST_F(OutOfMemory, NeverLosesPartOfAReport) {
+  const Testing::FixedEnvironment clock;
+  ExpectNothingElse(Explanation("tokens/holder-of-key.xml", "sts-rsa"));
+  ExpectNothingElse(Explanation("tokens/bearer.xml", "other"));
+  ExpectNothingElse(Explanation("tokens/ecdsa-p256-sha256.xml", "sts-ec256"));
+  ExpectNothingElse(Explanation("attacks/digest-resigned-first-bit.xml", "sts-rsa"));
+  ExpectNothingElse(Explanation("attacks/foreign-certificate.xml", "sts-rsa"));
 }
 
 TEST_F(OutOfMemory, IsReportedByCertificates) {
