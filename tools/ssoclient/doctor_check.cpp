@@ -147,7 +147,7 @@ std::string RenderChecksJson(const std::vector<DoctorCheck> &checks) {
     json["checks"].push_back(std::move(entry));
   }
   // A server's texts are not always UTF-8, but the result must still be JSON.
-  return json.dump(-1, ' ', true, Json::error_handler_t::replace) + "\n";
+  return json.dump(2, ' ', true, Json::error_handler_t::replace) + "\n";
 }
 
 } // namespace SsoClient::Tool

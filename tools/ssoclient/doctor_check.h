@@ -63,7 +63,7 @@ ExitCode ExitCodeOf(const std::vector<DoctorCheck> &checks);
 /// The checks as lines of text, for people.
 std::string RenderChecks(const std::vector<DoctorCheck> &checks, bool usesColour);
 
-/// The checks as one JSON object in one line.
+/// The checks as one JSON object.
 std::string RenderChecksJson(const std::vector<DoctorCheck> &checks);
 
 } // namespace SsoClient::Tool
