@@ -6,10 +6,12 @@
 
 #pragma once
 
+#include "exchange/fault_listener.h"
 #include "exchange/spnego_response.h"
 
 #include <tarvel/io/reader.h>
 
+#include <memory>
 #include <string>
 
 namespace SsoClient {
@@ -29,6 +31,13 @@ public:
 
   /// Sets all fields of `spnego` to the service's response to one leg of a negotiation.
   virtual void HandleSPNegoResponse(Tarvel::Reader *response, SPNegoResponse &spnego) const = 0;
+
+  /// A handler that does the same, and also shows each fault to `listener`, which must outlive it. Null if this handler cannot
+  /// do that.
+  virtual std::shared_ptr<const ResponseHandler> WithFaultListener(FaultListener &listener) const {
+    static_cast<void>(listener);
+    return nullptr;
+  }
 
 protected:
   ResponseHandler() = default;

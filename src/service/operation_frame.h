@@ -17,6 +17,9 @@ public:
   OperationFrame &operator=(const OperationFrame &) = delete;
   ~OperationFrame();
 
+  /// The UUID.
+  const std::string &GetId() const noexcept { return m_opId; }
+
 private:
   std::string m_opId;
   std::string m_operationName;

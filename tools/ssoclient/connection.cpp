@@ -97,15 +97,16 @@ Tarvel::Ref<Tarvel::Ssl::SSLContext> CreateContext(const ConnectionOptions &opti
 
 std::shared_ptr<SecurityTokenService> CreateService(const ConnectionOptions &options,
                                                     const Tarvel::Crypto::CertificateList &trusted,
-                                                    const boost::optional<HolderOfKeyConfig> &identity) {
+                                                    const boost::optional<HolderOfKeyConfig> &identity,
+                                                    const ServiceOptions &serviceOptions) {
   SecurityTokenServiceConfig config;
   config.stsUrl = options.url;
   config.signingCertificates = trusted;
   config.sslParameter = options.thumbprint;
   config.holderOfKeyConfig = identity;
   const Tarvel::Ref<Tarvel::Ssl::SSLContext> context = CreateContext(options);
-  config.sslContext = context.get();         // null for plain http
-  return CreateSecurityTokenService(config); // takes its own reference to the context
+  config.sslContext = context.get();                         // null for plain http
+  return CreateSecurityTokenService(config, serviceOptions); // takes its own reference to the context
 }
 
 } // namespace SsoClient::Tool

@@ -6,6 +6,7 @@
 
 #include <ssoclient/holder_of_key_config.h>
 #include <ssoclient/security_token_service.h>
+#include <ssoclient/service_options.h>
 #include <tarvel/core/ref.h>
 #include <tarvel/crypto/certificate.h>
 #include <tarvel/ssl/ssl_context.h>
@@ -43,6 +44,7 @@ Tarvel::Ref<Tarvel::Ssl::SSLContext> CreateContext(const ConnectionOptions &opti
 /// @throws Tarvel::IOException, Tarvel::Crypto::CryptoException
 std::shared_ptr<SecurityTokenService> CreateService(const ConnectionOptions &options,
                                                     const Tarvel::Crypto::CertificateList &trusted,
-                                                    const boost::optional<HolderOfKeyConfig> &identity);
+                                                    const boost::optional<HolderOfKeyConfig> &identity,
+                                                    const ServiceOptions &serviceOptions);
 
 } // namespace SsoClient::Tool

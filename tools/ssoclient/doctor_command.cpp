@@ -9,7 +9,7 @@
 #include "doctor_network.h"
 #include "doctor_tls.h"
 #include "option.h"
-#include "terminal.h"
+#include "terminal_style.h"
 
 #include <tarvel/http/url.h>
 #include <tarvel/ssl/server_probe.h>
@@ -84,8 +84,7 @@ ExitCode Diagnose(const DoctorOptions &options, const OutputOptions &output) {
   }
   CheckConnection(options.connection);
   const std::vector<DoctorCheck> checks = Examine(options, LoadFiles(options));
-  WriteOutput(output.format == Format::JSON ? RenderChecksJson(checks)
-                                            : RenderChecks(checks, UsesColour(STDOUT_FILENO)));
+  WriteOutput(output.format == Format::JSON ? RenderChecksJson(checks) : RenderChecks(checks, StyleOf(STDOUT_FILENO)));
   return ExitCodeOf(checks);
 }
 

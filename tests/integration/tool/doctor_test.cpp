@@ -64,13 +64,13 @@ TlsSettings Certificate(const std::string &name) {
   return settings;
 }
 
+/// Runs the doctor without wrapped lines.
+constexpr const char *WIDE_DOCTOR = "COLUMNS=1000 ssoclient doctor ";
+
 /// Runs the doctor for a server over TLS that the test authority has certified.
-Result DoctorOf(const ScriptedServer &server, const std::vector<std::string> &more = {}) {
-  std::vector<std::string> arguments = {"doctor", "--sts",
-                                        "https://localhost:" + std::to_string(server.GetPort()) + "/sts", "--ca",
-                                        TlsPath("authority.crt")};
-  arguments.insert(arguments.end(), more.begin(), more.end());
-  return RunTool(arguments);
+Result DoctorOf(const ScriptedServer &server, const std::string &more = {}) {
+  return RunShell(WIDE_DOCTOR + ("--sts https://localhost:" + std::to_string(server.GetPort())) + "/sts --ca " +
+                  TlsPath("authority.crt") + " " + more);
 }
 
 /// The lines of one check, without the names of the columns before them.
@@ -93,7 +93,7 @@ std::string Check(const Result &result, const std::string &check) {
 class Doctor : public ServiceTest {};
 
 TEST_F(Doctor, FindsNothingWrongWithAService) {
-  const Result result = Run("ssoclient doctor " + Service());
+  const Result result = Run(WIDE_DOCTOR + Service());
   EXPECT_EQ(0, result.exitCode);
   EXPECT_EQ("", result.err);
   // The machine may resolve the name to one address or to two.
@@ -164,7 +164,7 @@ TEST(DoctorRequest, ContainsNothingFromTheEnvironmentOrTheStandardInput) {
 }
 
 TEST_F(Doctor, AcceptsAThumbprintAndRefusesAnotherOne) {
-  const std::string url = "ssoclient doctor --sts " + m_service.GetUrl() + " --thumbprint ";
+  const std::string url = std::string(WIDE_DOCTOR) + "--sts " + m_service.GetUrl() + " --thumbprint ";
   const Result right = Run(url + m_service.GetThumbprint());
   EXPECT_EQ(0, right.exitCode);
   EXPECT_THAT(Check(right, "tls"),
@@ -186,17 +186,17 @@ TEST_F(Doctor, AcceptsAThumbprintAndRefusesAnotherOne) {
 }
 
 TEST_F(Doctor, RecognisesEachWrongAnswerOfAService) {
-  const Result garbage = Run("ssoclient doctor " + Service("garbage"));
+  const Result garbage = Run(WIDE_DOCTOR + Service("garbage"));
   EXPECT_EQ(8, garbage.exitCode);
-  const Result reset = Run("ssoclient doctor " + Service("reset"));
+  const Result reset = Run(WIDE_DOCTOR + Service("reset"));
   EXPECT_EQ(4, reset.exitCode);
   EXPECT_THAT(Check(reset, "http"), StartsWith("failed    "));
-  const Result stalled = Run("ssoclient doctor --timeout 1 " + Service("stall"));
+  const Result stalled = Run(WIDE_DOCTOR + Service("stall") + "--timeout 1");
   EXPECT_EQ(4, stalled.exitCode);
-  const Result unavailable = Run("ssoclient doctor " + Service("bad-status"));
+  const Result unavailable = Run(WIDE_DOCTOR + Service("bad-status"));
   EXPECT_EQ(8, unavailable.exitCode);
   EXPECT_THAT(Check(unavailable, "http"), HasSubstr("The service, or a gateway before it, is not available.\n"));
-  const Result oversize = Run("ssoclient doctor " + Service("oversize"));
+  const Result oversize = Run(WIDE_DOCTOR + Service("oversize"));
   EXPECT_EQ(8, oversize.exitCode);
   EXPECT_THAT(Check(oversize, "http"), HasSubstr("the body is longer than 16777216 bytes"));
 }
@@ -245,7 +245,7 @@ TEST(DoctorTls, RecognisesPlainHttpAtThePort) {
 
 TEST(DoctorTls, EndsForAServerThatHangsOrCloses) {
   const ScriptedServer silent([](ServerConnection &peer) { peer.Stall(); });
-  const Result hung = DoctorOf(silent, {"--timeout", "1"});
+  const Result hung = DoctorOf(silent, "--timeout 1");
   EXPECT_EQ(4, hung.exitCode);
   EXPECT_EQ("failed    The server accepts the connection, but does not end the handshake in time.\n"
             "to do     Look into the server's log, correct the port in --sts, or raise --timeout.\n",
@@ -311,15 +311,15 @@ TEST(DoctorAnswers, ComparesTheClocks) {
 
 TEST(DoctorCertificates, WarnsOfAnExpiredTrustedCertificateAndFailsWithoutAUsableKey) {
   const ScriptedServer server(Answering(Ok("text/xml", "<a/>")), Certificate("localhost"));
-  const Result expired = DoctorOf(server, {"--trust", TlsPath("expired.crt")});
+  const Result expired = DoctorOf(server, "--trust " + TlsPath("expired.crt"));
   EXPECT_THAT(Check(expired, "certificates"), StartsWith("warning   2 certificates.\n          CN=expired of "));
-  const Result weak = DoctorOf(server, {"--trust", Testing::DataPath("crypto/rsa1024.crt")});
+  const Result weak = DoctorOf(server, "--trust " + Testing::DataPath("crypto/rsa1024.crt"));
   EXPECT_THAT(Check(weak, "certificates"), StartsWith("failed    2 certificates.\n"));
 }
 
 TEST(DoctorNetwork, ReportsAPortThatRefuses) {
   const ClosedPort port;
-  const Result result = RunTool({"doctor", "--allow-http", "--sts", "http://" + port.HostAndPort() + "/sts"});
+  const Result result = RunShell(WIDE_DOCTOR + ("--allow-http --sts http://" + port.HostAndPort()) + "/sts");
   EXPECT_EQ(4, result.exitCode);
   EXPECT_EQ(
       "address       fine      127.0.0.1, port P: 127.0.0.1 (N ms).\n"

@@ -9,6 +9,7 @@
 #include <tarvel/xml/security/exceptions.h>
 #include <tarvel/xml/security/signature.h>
 
+#include <cstddef>
 #include <set>
 #include <string>
 #include <string_view>
@@ -51,5 +52,29 @@ inline std::string VerdictOf(const Tarvel::Xml::Security::Signature &signature,
     return exception.what();
   }
 }
+
+inline std::string NameOf(Tarvel::Xml::Security::SignatureRule rule) {
+  constexpr const char *NAMES[] = {"PROFILE", "KEYS", "REFERENCES", "VALUE", "DIGESTS"};
+  return NAMES[static_cast<std::size_t>(rule)];
+}
+
+using Texts = std::vector<std::string>;
+
+/// Each refusal on five lines: rule, message, element, what was found and wanted.
+inline Texts RefusalsOf(const Tarvel::Xml::Security::SignatureReport &report) {
+  Texts texts;
+  for (const auto &[rule, message, element, found, wanted] : report.refusals) {
+    const std::string name = element ? std::string(element->GetName()) : "no element";
+    texts.push_back(NameOf(rule) + "\n" + message + "\n" + name + "\n" + found + "\n" + wanted);
+  }
+  return texts;
+}
+
+inline Texts RefusalsOf(const Explained &explained) {
+  return RefusalsOf(explained.report);
+}
+
+/// The refusal of the signature's value; a change of `SignedInfo` causes it, too.
+constexpr const char *WRONG_VALUE = "VALUE\n\nds:SignatureValue\n\na signature by a trusted key";
 
 } // namespace Testing

@@ -30,7 +30,18 @@ TEST(RenderChecks, ShowsNameOutcomeFindingsDetailsAndAdviceInColumns) {
             "              to do     Do this.\n"
             "                        Do that.\n"
             "certificates  fine      2 certificates.\n",
-            RenderChecks({FailedCheck(), FineCheck()}, false));
+            RenderChecks({FailedCheck(), FineCheck()}, {100, false}));
+}
+
+TEST(RenderChecks, WrapsTextsAtTheWidth) {
+  DoctorCheck check("tcp");
+  check.found = {"A sentence of some words, which are too many for one line."};
+  check.Warn("Some advice that is also too long for a line.");
+  EXPECT_EQ("tcp           warning   A sentence of some words, which are\n"
+            "                        too many for one line.\n"
+            "              to do     Some advice that is also too long\n"
+            "                        for a line.\n",
+            RenderChecks({check}, {60, false}));
 }
 
 TEST(RenderChecks, ColoursNameOutcomeAndTheWordForAdvice) {
@@ -48,7 +59,7 @@ TEST(RenderChecks, ColoursNameOutcomeAndTheWordForAdvice) {
             "              \x1b[1mto do\x1b[0m     Hurry.\n"
             "\x1b[1mcertificates\x1b[0m  \x1b[32mfine\x1b[0m      2 certificates.\n"
             "\x1b[1mhttp\x1b[0m          not done  Nothing.\n",
-            RenderChecks({FailedCheck(), warning, FineCheck(), skipped}, true));
+            RenderChecks({FailedCheck(), warning, FineCheck(), skipped}, {100, true}));
 }
 
 TEST(RenderChecksJson, HasFindingsAndAdviceAsTextsAndTheFactsAsFurtherKeys) {

@@ -18,9 +18,9 @@ namespace SsoClient::Tool {
 /// Years after the start, and before the end, of most certificates of tests/data.
 inline const Tarvel::System::DateTime NOON("2026-01-02T12:00:00Z");
 
-/// The check as the tool shows it.
+/// The check as the tool shows it on a very wide terminal.
 inline std::string TextOf(const DoctorCheck &check) {
-  return RenderChecks({check}, false);
+  return RenderChecks({check}, {1000, false});
 }
 
 /// The check's object in JSON.

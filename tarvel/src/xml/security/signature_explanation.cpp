@@ -60,6 +60,7 @@ private:
   void TryKeys(const DigestValue &signedInfo);
   void TryKey(Key &key, const DigestValue &signedInfo);
   void TryUnselected(Key &key, const DigestValue &signedInfo);
+  void NameUnselectedMaker();
   void CheckDigests();
   bool CheckDigest(std::size_t index);
 
@@ -193,18 +194,17 @@ void Explanation::CheckValue() {
   }
 }
 
-// A verification tries its candidates until one made the value. All other usable keys are tried here only to say which one
-// made it, so a failure with one of them is not a refusal.
+// A verification tries its candidates until one made the value. All other usable keys are tried here only to report which
+// one made it, so a failure with one of them is not a refusal.
 void Explanation::TryKeys(const DigestValue &signedInfo) {
   const std::size_t refusalsBefore = m_report.refusals.size();
   std::vector<const Key *> tried;
   bool isMade = false;
-  for (Key *const key : m_candidates) {
-    if (!isMade) {
-      tried.push_back(key);
-      Try(SignatureRule::VALUE, m_syntax.signatureValueElement, [&] { TryKey(*key, signedInfo); });
-      isMade = key->madeSignature;
-    }
+  for (std::size_t index = 0; index < m_candidates.size() && !isMade; ++index) {
+    Key &key = *m_candidates[index];
+    Try(SignatureRule::VALUE, m_syntax.signatureValueElement, [&] { TryKey(key, signedInfo); });
+    isMade = key.madeSignature;
+    tried.push_back(&key);
   }
   if (!m_candidates.empty() && !isMade && m_report.refusals.size() == refusalsBefore) {
     Add(SignatureRule::VALUE, "", m_syntax.signatureValueElement).wanted = "a signature by a trusted key";
@@ -213,6 +213,9 @@ void Explanation::TryKeys(const DigestValue &signedInfo) {
     if (key.isUsable && std::find(tried.begin(), tried.end(), &key) == tried.end()) {
       TryUnselected(key, signedInfo);
     }
+  }
+  if (!isMade) {
+    NameUnselectedMaker();
   }
 }
 
@@ -226,14 +229,20 @@ void Explanation::TryUnselected(Key &key, const DigestValue &signedInfo) {
     TryKey(key, signedInfo);
   } catch (const Crypto::CryptoException &) { // A verification does not try this key.
   }
-  if (!key.madeSignature) {
+}
+
+/// If a key that the `KeyInfo` does not select made the value, adds that to the refusals that are about keys.
+void Explanation::NameUnselectedMaker() {
+  const auto maker =
+      std::find_if(m_report.keys.begin(), m_report.keys.end(), [](const Key &key) { return key.madeSignature; });
+  if (maker == m_report.keys.end()) {
     return;
   }
+  const SignatureReport::NamedCertificate certificate = DescribeCertificate(*maker->certificate);
   for (Refusal &refusal : m_report.refusals) {
     if (refusal.rule == SignatureRule::KEYS || refusal.rule == SignatureRule::VALUE) {
-      const SignatureReport::NamedCertificate maker = DescribeCertificate(*key.certificate);
-      refusal.found = "the signature of the trusted key of \"" + maker.subject + "\" (SHA-256 thumbprint " +
-                      maker.thumbprint + "), which KeyInfo does not select";
+      refusal.found = "a signature by the trusted key of \"" + certificate.subject + "\" (SHA-256 thumbprint " +
+                      certificate.thumbprint + "), which KeyInfo does not select";
     }
   }
 }

@@ -90,11 +90,12 @@ Refusal &RefuseAlgorithm(RefusalSink &sink, const char *kind, const AlgorithmSyn
                 syntax.element, syntax.uri);
 }
 
-Refusal &RefuseParameter(RefusalSink &sink, const AlgorithmSyntax &syntax, std::string_view parameter) {
-  return Refuse(sink,
-                "The parameter \"" + StringUtil::Shorten(parameter) + "\" of the algorithm \"" +
-                    StringUtil::Shorten(syntax.uri) + "\" is not accepted",
-                syntax.element, parameter);
+void RefuseParameter(RefusalSink &sink, const AlgorithmSyntax &syntax, std::string_view parameter) {
+  Refuse(sink,
+         "The parameter \"" + StringUtil::Shorten(parameter) + "\" of the algorithm \"" +
+             StringUtil::Shorten(syntax.uri) + "\" is not accepted",
+         syntax.element, parameter)
+      .wanted = "no such parameter";
 }
 
 // The following functions return whether `sink` received nothing from them, or the algorithm only then.
@@ -237,7 +238,8 @@ void PlanTransforms(const std::vector<AlgorithmSyntax> &transforms, ReferencePla
 ReferencePlan PlanReference(const ReferenceSyntax &syntax, RefusalSink &sink) {
   if (syntax.type) {
     Refuse(sink, "A reference of the type \"" + StringUtil::Shorten(*syntax.type) + "\" is not accepted",
-           syntax.element, *syntax.type);
+           syntax.element, *syntax.type)
+        .wanted = "no Type";
   }
   ReferencePlan plan;
   PlanTransforms(syntax.transforms, plan, sink);
@@ -251,7 +253,8 @@ ReferencePlan PlanReference(const ReferenceSyntax &syntax, RefusalSink &sink) {
 
 void RequireAcceptedParts(const SignatureSyntax &syntax, RefusalSink &sink) {
   if (syntax.object) {
-    Refuse(sink, "A signature with ds:Object is not accepted", syntax.object, syntax.object->GetName());
+    Refuse(sink, "A signature with ds:Object is not accepted", syntax.object, syntax.object->GetName()).wanted =
+        "no ds:Object";
   }
   if (syntax.references.empty()) {
     Refuse(sink, "The signature has no reference", syntax.signedInfo, "").wanted = "a reference";

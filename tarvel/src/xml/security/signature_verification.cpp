@@ -17,7 +17,7 @@ namespace {
 class ParsedSignature final : public Signature {
 public:
   ParsedSignature(const ElementNode &root, const ElementNode &element)
-      : m_signature{Ref(&root), Ref(&element), ReadSignatureSyntax(element)} {
+      : m_signature{Ref<const ElementNode>(&root), Ref<const ElementNode>(&element), ReadSignatureSyntax(element)} {
     m_references.reserve(m_signature.syntax.references.size());
     for (const ReferenceSyntax &reference : m_signature.syntax.references) {
       m_references.push_back({std::string(reference.uri)});

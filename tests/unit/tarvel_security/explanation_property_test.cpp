@@ -112,4 +112,58 @@ TEST(Explain, AgreesWithVerifyWhateverCharacterOfASignatureIsChanged) {
   EXPECT_LE(100u, verdicts.size());
 }
 
+struct Change {
+  std::string from;
+  std::string to;
+};
+
+/// Changes of a token, each of which breaks one rule, and some that break none.
+std::vector<Change> Changes(const std::string &token) {
+  const std::string transform = "<ds:Transform Algorithm=\"http://www.w3.org/2001/10/xml-exc-c14n#\"/>";
+  const std::string id = IdOf(token);
+  return {
+      {"</ds:Signature>", "<ds:Object/></ds:Signature>"},
+      {"</ds:Signature>", "<!-- nothing --></ds:Signature>"},
+      {"xml-exc-c14n#\"/><ds:SignatureMethod", "unknown\"/><ds:SignatureMethod"},
+      {"rsa-sha256", "rsa-sha1"},
+      {"rsa-sha256\"/>", "rsa-sha256\"><ds:HMACOutputLength>8</ds:HMACOutputLength></ds:SignatureMethod>"},
+      {"<ds:Reference ", "<ds:Reference Type=\"urn:type\" "},
+      {"xmldsig#enveloped-signature", "xmldsig#base64"},
+      {transform, transform + transform},
+      {transform, ""},
+      {"xmlenc#sha256", "xmlenc#ripemd160"},
+      {"xmlenc#sha256", "xmlenc#sha512"},
+      {"URI=\"#" + id, "URI=\"#nobody"},
+      {"URI=\"#" + id, "URI=\""},
+      {"URI=\"#" + id, "URI=\"#xpointer(/)"},
+      {"URI=\"#" + id, "URI=\"#subject"},
+      {"<saml:Subject>", "<saml:Subject Id=\"subject\">"},
+      {"<ds:KeyInfo", "<ds:KeyInfo Id=\"" + id + "\""},
+      {"<saml:Subject>", "<saml:Subject><foo:bar/>"},
+      {"<ds:SignedInfo>", "<ds:SignedInfo xmlns:r=\"relative\">"},
+      {"alice", "malice"},
+      {"<ds:SignatureValue>", "<ds:SignatureValue>AAAA"},
+      {"<ds:DigestValue>", "<ds:DigestValue>AAAA"},
+  };
+}
+
+std::string Applied(const std::string &text, const Change &change) {
+  return text.find(change.from) == std::string::npos ? text : Testing::Replaced(text, change.from, change.to);
+}
+
+TEST(Explain, AgreesWithVerifyForEachTwoOfManyChanges) {
+  std::set<std::string> verdicts;
+  for (const char *const name : {"tokens/rsa-sha256.xml", "tokens/reference-two.xml"}) {
+    const std::string token = Testing::ReadDataFile(name);
+    for (const Change &first : Changes(token)) {
+      for (const Change &second : Changes(token)) {
+        Compare(Applied(Applied(token, first), second), first.to + " and " + second.to, verdicts);
+      }
+    }
+  }
+  EXPECT_EQ(1u, verdicts.count("accepted"));
+  EXPECT_EQ(1u, verdicts.count("wrong"));
+  EXPECT_LE(20u, verdicts.size());
+}
+
 } // namespace

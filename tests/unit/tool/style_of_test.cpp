@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 
-#include "terminal.h"
+#include "terminal_style.h"
 
 #include <gtest/gtest.h>
 
@@ -84,54 +84,51 @@ private:
   std::string m_earlier;
 };
 
-TEST(UsesColour, IsTrueOnlyForATerminal) {
-  const ScopedVariable colour("NO_COLOR", nullptr);
-  const ScopedVariable kind("TERM", "xterm");
-  EXPECT_TRUE(UsesColour(PseudoTerminal().Get()));
-  EXPECT_FALSE(UsesColour(PlainFile().Get()));
-  EXPECT_FALSE(UsesColour(-1));
+class StyleOfDescriptor : public testing::Test {
+protected:
+  const PseudoTerminal m_terminal;
+  const PlainFile m_file;
+
+private:
+  const ScopedVariable m_colour{"NO_COLOR", nullptr};
+  const ScopedVariable m_kind{"TERM", "xterm"};
+  const ScopedVariable m_columns{"COLUMNS", nullptr};
+};
+
+TEST_F(StyleOfDescriptor, HasColoursOnlyForATerminal) {
+  EXPECT_TRUE(StyleOf(m_terminal.Get()).hasColours);
+  EXPECT_FALSE(StyleOf(m_file.Get()).hasColours);
+  EXPECT_FALSE(StyleOf(-1).hasColours);
 }
 
-TEST(UsesColour, RespectsNoColorUnlessItIsEmpty) {
-  const PseudoTerminal terminal;
-  const ScopedVariable kind("TERM", "xterm");
+TEST_F(StyleOfDescriptor, RespectsNoColorUnlessItIsEmpty) {
   {
     const ScopedVariable colour("NO_COLOR", "0");
-    EXPECT_FALSE(UsesColour(terminal.Get()));
+    EXPECT_FALSE(StyleOf(m_terminal.Get()).hasColours);
   }
   const ScopedVariable colour("NO_COLOR", "");
-  EXPECT_TRUE(UsesColour(terminal.Get()));
+  EXPECT_TRUE(StyleOf(m_terminal.Get()).hasColours);
 }
 
-TEST(UsesColour, IsFalseForATerminalWithoutColour) {
-  const PseudoTerminal terminal;
-  const ScopedVariable colour("NO_COLOR", nullptr);
+TEST_F(StyleOfDescriptor, HasNoColoursForATerminalWithoutColour) {
   const ScopedVariable kind("TERM", "dumb");
-  EXPECT_FALSE(UsesColour(terminal.Get()));
+  EXPECT_FALSE(StyleOf(m_terminal.Get()).hasColours);
 }
 
-TEST(Coloured, PutsTheTextBetweenTheColourAndItsEnd) {
-  EXPECT_EQ("\x1b[32mfine\x1b[0m", Coloured("fine", Colour::GREEN, true));
-  EXPECT_EQ("\x1b[33mwarning\x1b[0m", Coloured("warning", Colour::YELLOW, true));
-  EXPECT_EQ("\x1b[31mfailed\x1b[0m", Coloured("failed", Colour::RED, true));
-  EXPECT_EQ("\x1b[1mTLS\x1b[0m", Coloured("TLS", Colour::BOLD, true));
+TEST_F(StyleOfDescriptor, HasTheWidthOfTheTerminal) {
+  EXPECT_EQ(132u, StyleOf(m_terminal.Get()).width);
 }
 
-TEST(Coloured, LeavesTheTextUnchangedWithoutColour) {
-  EXPECT_EQ("fine", Coloured("fine", Colour::GREEN, false));
-  EXPECT_EQ("fine", Coloured("fine", Colour::NONE, true));
+TEST_F(StyleOfDescriptor, HasTheDefaultWidthWhenItIsNotKnown) {
+  m_terminal.SetColumns(0);
+  EXPECT_EQ(100u, StyleOf(m_terminal.Get()).width);
+  EXPECT_EQ(100u, StyleOf(m_file.Get()).width);
 }
 
-TEST(GetWidth, IsTheNumberOfColumnsOfTheTerminal) {
-  const PseudoTerminal terminal;
-  EXPECT_EQ(132u, GetWidth(terminal.Get()));
-}
-
-TEST(GetWidth, IsTheDefaultWhenItIsNotKnown) {
-  const PseudoTerminal terminal;
-  terminal.SetColumns(0);
-  EXPECT_EQ(80u, GetWidth(terminal.Get()));
-  EXPECT_EQ(80u, GetWidth(PlainFile().Get()));
+TEST_F(StyleOfDescriptor, HasTheWidthOfColumnsFirst) {
+  const ScopedVariable columns("COLUMNS", "77");
+  EXPECT_EQ(77u, StyleOf(m_terminal.Get()).width);
+  EXPECT_EQ(77u, StyleOf(m_file.Get()).width);
 }
 
 } // namespace
