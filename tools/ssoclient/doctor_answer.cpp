@@ -35,7 +35,7 @@ struct KindRow {
 };
 
 constexpr KindRow KINDS[] = {
-    {Kind::EMPTY, "empty", "no content"},
+    {Kind::EMPTY, "empty", "empty"},
     {Kind::HTML, "html", "an HTML page"},
     {Kind::TEXT, "text", "neither XML nor HTML"},
     {Kind::MALFORMED, "malformed xml", "XML that is not well-formed"},
@@ -247,7 +247,7 @@ DoctorCheck CheckTrust(const ServiceAnswer *answer) {
   case Kind::EMPTY:
   case Kind::HTML:
   case Kind::TEXT:
-    check.found.push_back(std::string("The answer is not SOAP, but ") + DescriptionOf(answer->kind) + ".");
+    check.found.push_back(std::string("The answer is ") + DescriptionOf(answer->kind) + ", and not SOAP.");
     check.Fail(ExitCode::SERVICE_FAULT, WRONG_ADDRESS);
     break;
   }

@@ -32,10 +32,7 @@ void CheckDates(const Certificate &certificate, const CertificateFile &file, con
   if (!isEarly && days >= SOON_DAYS) {
     return;
   }
-  check.found.push_back(NameOf(certificate, file) + " " +
-                        (isEarly    ? "is "
-                         : days < 0 ? ""
-                                    : "has ") +
+  check.found.push_back(NameOf(certificate, file) + " " + (isEarly || days < 0 ? "" : "has ") +
                         LeftText(certificate, now) + ".");
   if (file.isAuthority) {
     check.Warn(

@@ -2,7 +2,7 @@
 
 #include "doctor_check.h"
 
-#include "terminal_style.h"
+#include "table.h"
 
 #include <tarvel/core/string_util.h>
 
@@ -16,6 +16,7 @@ using Json = nlohmann::ordered_json;
 constexpr std::size_t MAX_SHOWN_BYTES = 200;
 constexpr std::size_t NAME_COLUMNS = 14;
 constexpr std::size_t OUTCOME_COLUMNS = 10;
+constexpr std::size_t INDENT = NAME_COLUMNS + OUTCOME_COLUMNS; // less than the least width
 
 struct OutcomeText {
   const char *text;
@@ -41,26 +42,26 @@ std::string Column(const std::string &text, std::size_t width, Colour colour, bo
   return Coloured(text, colour, usesColour) + std::string(width - std::min(width, text.size()), ' ');
 }
 
-void AddLine(std::string &lines, const std::string &columns, const std::string &text) {
-  lines += columns + text + "\n";
+/// Adds the text, wrapped, after `columns`. Its later lines, and the next text, begin below its first one.
+void AddText(std::string &lines, std::string &columns, const std::string &text, const TextStyle &style) {
+  for (const std::string &line : Wrap(text, style.width - INDENT)) {
+    lines += columns + line + "\n";
+    columns = std::string(INDENT, ' ');
+  }
 }
 
-void AddCheck(std::string &lines, const DoctorCheck &check, bool usesColour) {
-  const std::string indent(NAME_COLUMNS + OUTCOME_COLUMNS, ' ');
+void AddCheck(std::string &lines, const DoctorCheck &check, const TextStyle &style) {
   const auto [outcome, colour] = TextOf(check.outcome);
-  std::string columns =
-      Column(check.name, NAME_COLUMNS, Colour::BOLD, usesColour) + Column(outcome, OUTCOME_COLUMNS, colour, usesColour);
-  for (const std::string &sentence : check.found) {
-    AddLine(lines, columns, sentence);
-    columns = indent;
+  std::string columns = Column(check.name, NAME_COLUMNS, Colour::BOLD, style.hasColours) +
+                        Column(outcome, OUTCOME_COLUMNS, colour, style.hasColours);
+  for (const std::vector<std::string> *const texts : {&check.found, &check.details}) {
+    for (const std::string &text : *texts) {
+      AddText(lines, columns, text, style);
+    }
   }
-  for (const std::string &detail : check.details) {
-    AddLine(lines, indent, detail);
-  }
-  columns = std::string(NAME_COLUMNS, ' ') + Column("to do", OUTCOME_COLUMNS, Colour::BOLD, usesColour);
+  columns = std::string(NAME_COLUMNS, ' ') + Column("to do", OUTCOME_COLUMNS, Colour::BOLD, style.hasColours);
   for (const std::string &advice : check.todo) {
-    AddLine(lines, columns, advice);
-    columns = indent;
+    AddText(lines, columns, advice, style);
   }
 }
 
@@ -125,10 +126,10 @@ ExitCode ExitCodeOf(const std::vector<DoctorCheck> &checks) {
   return failed == checks.end() ? ExitCode::DONE : failed->exitCode;
 }
 
-std::string RenderChecks(const std::vector<DoctorCheck> &checks, bool usesColour) {
+std::string RenderChecks(const std::vector<DoctorCheck> &checks, const TextStyle &style) {
   std::string lines;
   for (const DoctorCheck &check : checks) {
-    AddCheck(lines, check, usesColour);
+    AddCheck(lines, check, style);
   }
   return lines;
 }
@@ -147,7 +148,7 @@ std::string RenderChecksJson(const std::vector<DoctorCheck> &checks) {
     json["checks"].push_back(std::move(entry));
   }
   // A server's texts are not always UTF-8, but the result must still be JSON.
-  return json.dump(-1, ' ', true, Json::error_handler_t::replace) + "\n";
+  return json.dump(2, ' ', true, Json::error_handler_t::replace) + "\n";
 }
 
 } // namespace SsoClient::Tool

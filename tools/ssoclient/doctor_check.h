@@ -5,6 +5,7 @@
 #pragma once
 
 #include "exit_code.h"
+#include "terminal_style.h"
 
 #include <tarvel/system/date_time.h>
 
@@ -61,9 +62,9 @@ std::string JoinTexts(const std::vector<std::string> &texts, std::string_view se
 ExitCode ExitCodeOf(const std::vector<DoctorCheck> &checks);
 
 /// The checks as lines of text, for people.
-std::string RenderChecks(const std::vector<DoctorCheck> &checks, bool usesColour);
+std::string RenderChecks(const std::vector<DoctorCheck> &checks, const TextStyle &style);
 
-/// The checks as one JSON object in one line.
+/// The checks as one JSON object.
 std::string RenderChecksJson(const std::vector<DoctorCheck> &checks);
 
 } // namespace SsoClient::Tool

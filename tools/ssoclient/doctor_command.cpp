@@ -84,8 +84,7 @@ ExitCode Diagnose(const DoctorOptions &options, const OutputOptions &output) {
   }
   CheckConnection(options.connection);
   const std::vector<DoctorCheck> checks = Examine(options, LoadFiles(options));
-  WriteOutput(output.format == Format::JSON ? RenderChecksJson(checks)
-                                            : RenderChecks(checks, StyleOf(STDOUT_FILENO).hasColours));
+  WriteOutput(output.format == Format::JSON ? RenderChecksJson(checks) : RenderChecks(checks, StyleOf(STDOUT_FILENO)));
   return ExitCodeOf(checks);
 }
 

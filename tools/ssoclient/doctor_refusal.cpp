@@ -62,9 +62,8 @@ std::string DescribeCertificate(const DoctorTarget &target, const ServerRefusal 
   const std::string subject = "The certificate " + Shown(certificate.GetSubject()) + " ";
   switch (refusal.kind) {
   case Kind::EXPIRED:
-    return subject + LeftText(certificate, now) + ".";
   case Kind::NOT_YET_VALID:
-    return subject + "is " + LeftText(certificate, now) + ".";
+    return subject + LeftText(certificate, now) + ".";
   case Kind::OTHER_NAME:
     return DescribeNames(target, certificate);
   case Kind::UNKNOWN_ISSUER:
@@ -74,6 +73,7 @@ std::string DescribeCertificate(const DoctorTarget &target, const ServerRefusal 
   case Kind::WEAK_KEY:
     return subject + "has a weak key (" + Tarvel::Crypto::ReadCertificateFacts(certificate).key + ").";
   case Kind::WEAK_SIGNATURE:
+    return subject + "is signed with a weak algorithm.";
   case Kind::WRONG_PURPOSE:
   case Kind::OTHER_THUMBPRINT:
   case Kind::OTHER:

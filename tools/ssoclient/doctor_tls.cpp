@@ -141,7 +141,7 @@ std::int64_t DaysLeft(const Certificate &certificate, const DateTime &now) {
 std::string LeftText(const Certificate &certificate, const DateTime &now) {
   const std::int64_t until = certificate.GetNotBefore().MicrosecondsSince(now);
   if (until > 0) {
-    return "not valid for another " + DaysText(until);
+    return "becomes valid in " + DaysText(until);
   }
   const std::int64_t left = certificate.GetNotAfter().MicrosecondsSince(now);
   return left < 0 ? "expired " + DaysText(-left) + " ago" : DaysText(left) + " left";

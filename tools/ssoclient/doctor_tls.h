@@ -22,7 +22,7 @@ constexpr std::int64_t SOON_DAYS = 30;
 /// Whole days until the certificate ends, rounded down: negative when it has ended.
 std::int64_t DaysLeft(const Tarvel::Crypto::Certificate &certificate, const Tarvel::System::DateTime &now);
 
-/// Such as "93 days left", "expired 12 days ago" and "not valid for another 3 days".
+/// Such as "93 days left", "expired 12 days ago" and "becomes valid in 3 days".
 std::string LeftText(const Tarvel::Crypto::Certificate &certificate, const Tarvel::System::DateTime &now);
 
 /// The facts that both lists of certificates have in JSON.

@@ -56,7 +56,7 @@ constexpr Command COMMANDS[] = {
      DefineInspect},
     {"doctor", "Find out why a service cannot be used, without sending it any credential",
      "  ssoclient doctor --sts https://sts.corp.example/sts --ca ca.pem --trust sts.pem\n"
-     "  ssoclient doctor --sts https://sts.corp.example/sts --timeout 5 --format json\n",
+     "  ssoclient doctor --sts https://sts.corp.example/sts --ca ca.pem --timeout 5 --format json\n",
      DefineDoctor},
 };
 

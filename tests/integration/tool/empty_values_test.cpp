@@ -17,7 +17,7 @@ namespace {
 
 using testing::IsSupersetOf;
 
-const char *const COMMANDS[] = {"acquire", "renew", "validate", "verify", "inspect"};
+const char *const COMMANDS[] = {"acquire", "renew", "validate", "verify", "inspect", "doctor"};
 
 class EmptyValue : public testing::TestWithParam<const char *> {};
 
