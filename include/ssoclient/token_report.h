@@ -86,10 +86,12 @@ struct TokenReport {
 
   /// One thing for which a token is refused.
   struct Finding {
-    std::string message;      ///< the text of the exception with which `Verify` would refuse it
-    std::string element;      ///< the name of the element as written; empty if the finding has no place
-    std::string attribute;    ///< the name of the attribute; empty if the finding is about the element
-    std::string path;         ///< from the document element to the element, such as "/saml2:Assertion/saml2:Subject"
+    std::string message;   ///< the text of the exception with which `Verify` would refuse it
+    std::string element;   ///< the name of the element as written; empty if the finding has no place
+    std::string attribute; ///< the name of the attribute; empty if the finding is about the element
+    /// From the topmost element to the element, such as "/saml2:Assertion/saml2:Subject"; "[n]" after a name means the
+    /// n-th element of that name under its parent, and "[?]" one with too many nodes before it to count them.
+    std::string path;
     std::uint32_t line = 0;   ///< of the element's start tag, or of the error in the text; from 1; 0: unknown
     std::uint32_t column = 0; ///< from 1, in bytes; 0: unknown
     std::string wanted;       ///< what is allowed or expected there; may be empty
@@ -138,7 +140,8 @@ struct TokenReport {
     bool isTrusted = false; ///< it is one of the trusted certificates; otherwise it is a stranger's
   };
 
-  /// The maximum number of findings in a report. Further ones are only counted.
+  /// The maximum number of findings in a report. Further ones are only counted, but each check that failed lists at least
+  /// one.
   static constexpr std::size_t MAX_FINDINGS = 1000;
 
   bool accepted = false; ///< whether `Verify` would return a token; exactly when no check has failed or was not done
@@ -153,7 +156,8 @@ struct TokenReport {
   Tarvel::System::DateTime checkedAt;              ///< this machine's clock when the times were checked
   UnverifiedClaims claims;
 
-  /// The result of `check`. Never null in a report that `TokenVerifier::Explain` returned.
+  /// The result of `check`, which every report of `TokenVerifier::Explain` has.
+  /// @throws Tarvel::InvalidArgumentException when a report that was made in another way has no such check.
   SSOCLIENT_API const CheckResult &Get(Check check) const;
 
   /// The first check that failed, or null.
@@ -166,8 +170,8 @@ SSOCLIENT_API const char *GetCheckName(TokenReport::Check check) noexcept;
 /// The name of an outcome: "passed", "failed" or "not done".
 SSOCLIENT_API const char *GetOutcomeName(TokenReport::Outcome outcome) noexcept;
 
-/// `report` as text for a log or a person: one line for each check, and below it one for each finding. Printable, and ends
-/// in a line end.
+/// `report` as text for a log or a person: a line with the verdict, one for each check, and below it a few for each finding.
+/// Without `claims`, which are not verified. Printable except for its line ends, the last of which is at its end.
 SSOCLIENT_API std::string WriteTokenReport(const TokenReport &report);
 
 } // namespace SsoClient

@@ -11,8 +11,11 @@
 #include <tarvel/core/exception.h>
 #include <tarvel/crypto/certificate.h>
 #include <tarvel/crypto/private_key.h>
+#include <tarvel/io/reader.h>
 #include <tarvel/ssl/ssl_context.h>
+#include <tarvel/xml/document.h>
 #include <tarvel/xml/node.h>
+#include <tarvel/xml/parser.h>
 #include <tarvel/xml/security/canonicalizer.h>
 #include <tarvel/xml/security/signature.h>
 
@@ -20,8 +23,10 @@
 
 #include <functional>
 #include <map>
+#include <stdexcept>
 #include <string>
 #include <typeinfo>
+#include <vector>
 
 namespace {
 
@@ -93,6 +98,14 @@ std::string Changed(std::string token) {
   return token.replace(token.find("alice"), 5, "malory");
 }
 
+Tarvel::Crypto::CertificateList LoadTrusted(const std::vector<std::string> &names) {
+  Tarvel::Crypto::CertificateList trusted;
+  for (const std::string &name : names) {
+    trusted.push_back(Tarvel::Crypto::LoadCertificates(DataPath("tokens/" + name + ".crt")).front());
+  }
+  return trusted;
+}
+
 std::function<void()> Verification(const std::string &xml, const std::string &certificate) {
   const auto trusted = Tarvel::Crypto::LoadCertificates(DataPath("tokens/" + certificate + ".crt"));
   return [xml, trusted] { SsoClient::CreateSamlToken(xml, trusted); };
@@ -113,6 +126,25 @@ TEST_F(OutOfMemory, NeverCausesATamperedTokenToBeAccepted) {
     ExpectNothingElse(Verification(Token(name), "other"), TAMPERED);
   }
   ExpectNothingElse(Verification(Changed(Token("ecdsa-p256-sha256")), "sts-ec256"), TAMPERED);
+}
+
+// The certificate in KeyInfo is not a trusted one, so that it is decoded.
+TEST_F(OutOfMemory, NeverChangesTheReportOnASignature) {
+  const Ref<Tarvel::Reader> reader = Tarvel::CreateStringReader(Token("bearer"));
+  const Ref<Tarvel::Object> parsed =
+      Tarvel::Xml::CreateXMLParser(Tarvel::Xml::CreateXMLDocumentHandler())->Parse(*reader);
+  const auto &root = *dynamic_cast<Tarvel::Xml::Document &>(*parsed).GetDocumentElement();
+  Ref<Tarvel::Xml::Security::Signature> signature;
+  CreateSignatureFromDom(root, *root.FindChildElement("Signature"), signature);
+  const auto resolver = Tarvel::Xml::Security::CreateTrustSetKeyResolver(LoadTrusted({"other", "sts-rsa-reissued"}));
+  ExpectNothingElse([&] {
+    const Tarvel::Xml::Security::SignatureReport report = signature->Explain(*resolver);
+    const auto &stranger = report.namedCertificates.at(0);
+    if (!report.refusals.empty() || !report.keys.at(1).madeSignature || stranger.subject.empty() ||
+        stranger.thumbprint.empty()) {
+      throw std::logic_error("another report");
+    }
+  });
 }
 
 TEST_F(OutOfMemory, IsReportedByVerificationOnTheFirstUseOfAKey) {
