@@ -46,8 +46,8 @@ struct UnverifiedClaims {
   std::vector<Delegate> delegationChain;                         ///< those that can be read
   std::set<std::string> audience;
   std::vector<Advice> advice;
-  /// Of a holder-of-key token: the subject and the SHA-256 thumbprint of the certificate, as texts. They are empty for
-  /// other tokens.
+  /// The subject and the SHA-256 thumbprint of the certificate in a holder-of-key token, as texts; empty for other
+  /// tokens.
   std::string certificateSubject;
   std::string certificateThumbprint;
 };
@@ -56,8 +56,8 @@ struct UnverifiedClaims {
 /// earlier one has failed.
 ///
 /// All texts except `refusal` and `claims` are printable: characters that could control a terminal are written as \\uXXXX
-/// (`Tarvel::StringUtil::Printable`), and a text is cut at `Tarvel::StringUtil::MAX_VALUE_BYTES`. A report holds no secret and no
-/// token, but names of persons and groups. It refers to nothing outside itself, except to the trusted certificates.
+/// (`Tarvel::StringUtil::Printable`), and a text is cut at `Tarvel::StringUtil::MAX_VALUE_BYTES`. A report contains names of
+/// persons and groups, but no secret and no token. It refers to nothing outside itself, except to the trusted certificates.
 struct TokenReport {
   /// The checks, in the order of the verification.
   enum class Check : std::int32_t {
@@ -96,8 +96,9 @@ struct TokenReport {
     std::uint32_t column = 0; ///< from 1, in bytes; 0: unknown
     std::string wanted;       ///< what is allowed or expected there; may be empty
     std::string found;        ///< what is there; may be empty
-    std::int64_t missedBySec =
-        0;              ///< of a time: by how many seconds this machine's clock misses it, after the tolerance
+    /// By how many seconds, rounded up, this machine's clock is outside the validity period with its tolerance; 0 for
+    /// findings that are not about the clock.
+    std::int64_t missedBySec = 0;
     std::string remedy; ///< what the reader can do about it; may be empty
   };
 

@@ -45,8 +45,9 @@ public:
 
   /// Runs the checks of `Verify` on `xml`, goes on after a failure, and reports each check. `accepted` is true exactly
   /// when `Verify` returns a token at the same moment. Nothing in the report may be trusted: it is not a token. If `xml`
-  /// is well-formed but its document element is not an assertion, the first assertion in it is reported, too; the
-  /// report is then not accepted.
+  /// is well-formed but its document element is not an assertion, the report also shows the first assertion in it, and
+  /// does not accept it. Takes longer than `Verify`, for example because it computes the digests even if no trusted key
+  /// made the signature: make a report when a person wants to know why, not for each refused token.
   /// @throws Tarvel::OutOfMemoryException, std::bad_alloc and Tarvel::InvalidStateException like `Verify`, and nothing else:
   ///         no text in `xml` makes it throw.
   TokenReport Explain(const std::string &xml) const;
