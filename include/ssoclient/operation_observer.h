@@ -49,7 +49,7 @@ struct OperationEndedEvent {
   /// The kinds of outcome.
   enum class Outcome : std::int32_t { SUCCEEDED = 0, FAILED };
 
-  Outcome outcome = Outcome::SUCCEEDED;
+  Outcome outcome = Outcome::SUCCEEDED; ///< whether the operation returned a result or threw an exception
   /// The unqualified name of the failure's class. It and the message are empty if the operation succeeded, and if it
   /// failed and there was no memory for them.
   std::string exceptionClass;
