@@ -17,7 +17,6 @@ namespace Tarvel::Xml::Security {
 
 namespace {
 
-constexpr unsigned MIN_RSA_BITS = 2048;
 constexpr std::size_t MAX_DESCRIBED_KEYS = 10; // in one text
 
 std::string DescribeKey(const Crypto::Certificate &certificate) {
@@ -63,18 +62,8 @@ void RefuseTarget(const ReferenceSyntax &reference, const char *why, RefusalSink
 
 bool IsUsable(const Crypto::Certificate &certificate, Crypto::SignatureScheme scheme) {
   unsigned bits = 0;
-  switch (Crypto::GetKeyKind(certificate, bits)) {
-  case Crypto::KeyKind::RSA:
-    return scheme != Crypto::SignatureScheme::ECDSA && bits >= MIN_RSA_BITS &&
-           Crypto::HasAcceptableExponent(certificate);
-  case Crypto::KeyKind::EC_P256:
-  case Crypto::KeyKind::EC_P384:
-  case Crypto::KeyKind::EC_P521:
-    return scheme == Crypto::SignatureScheme::ECDSA;
-  case Crypto::KeyKind::OTHER:
-    return false;
-  }
-  return false;
+  const bool isRsa = Crypto::GetKeyKind(certificate, bits) == Crypto::KeyKind::RSA;
+  return isRsa == (scheme != Crypto::SignatureScheme::ECDSA) && Crypto::RefuseKey(certificate).empty();
 }
 
 Crypto::CertificateList RequireUsableKeys(const SignatureSyntax &syntax, Crypto::SignatureScheme scheme,
