@@ -45,9 +45,9 @@ public:
 
   /// Runs the checks of `Verify` on `xml`, goes on after a failure, and reports each check. `accepted` is true exactly
   /// when `Verify` returns a token at the same moment. Nothing in the report may be trusted: it is not a token. If `xml`
-  /// is well-formed but its document element is not an assertion, the first assertion in it is reported, too; the
-  /// report is then not accepted. It takes linear time, but more than `Verify`: it computes digests also when no trusted key made
-  /// the signature. Call it when `Verify` has refused a token and someone wants to know why, not for each token.
+  /// is well-formed but its document element is not an assertion, the report also shows the first assertion in it, and
+  /// does not accept it. It takes linear time, but more than `Verify`, for example because it computes the digests even if
+  /// no trusted key made the signature. Call it when a person wants to know why a token is refused, not for each token.
   /// @throws Tarvel::OutOfMemoryException, std::bad_alloc and Tarvel::InvalidStateException like `Verify`, and nothing else:
   ///         no text in `xml` makes it throw.
   TokenReport Explain(const std::string &xml) const;
