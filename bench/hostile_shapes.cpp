@@ -1,13 +1,16 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
 /// Compares the cost of hostile documents, until `CreateSamlToken` refuses or accepts them, with the cost of a genuine
-/// token of 5 MB. All costs are for each octet.
+/// token of 5 MB. Does the same for `TokenVerifier::Explain`, the report on the document. All costs are for each octet.
+///
+/// In the JSON, the figures of reports are under the key "report", with the same keys as those of verifications.
 
 #include "counted_heap.h"
 #include "hostile_documents.h"
 #include "program.h"
 
 #include <ssoclient/create_saml_token.h>
+#include <ssoclient/token_verifier.h>
 
 #include <malloc.h>
 
@@ -18,6 +21,7 @@
 #include <ctime>
 #include <exception>
 #include <fstream>
+#include <functional>
 #include <iostream>
 #include <limits>
 #include <ostream>
@@ -57,15 +61,30 @@ double CpuSeconds() {
   return static_cast<double>(now.tv_sec) + static_cast<double>(now.tv_nsec) * 1e-9;
 }
 
-Cost MeasureOnce(const std::string &xml, const Tarvel::Crypto::CertificateList &trusted) {
+/// What is measured: reads a text, and returns why it is refused. An empty text means that it is accepted.
+using Reading = std::function<std::string(const std::string &xml)>;
+
+Reading Verifying(const Tarvel::Crypto::CertificateList &trusted) {
+  return [trusted](const std::string &xml) {
+    try {
+      SsoClient::CreateSamlToken(xml, trusted);
+      return std::string();
+    } catch (const std::exception &error) {
+      return std::string(error.what());
+    }
+  };
+}
+
+Reading Explaining(const Tarvel::Crypto::CertificateList &trusted) {
+  return
+      [verifier = SsoClient::TokenVerifier(trusted)](const std::string &xml) { return verifier.Explain(xml).refusal; };
+}
+
+Cost MeasureOnce(const std::string &xml, const Reading &read) {
   Cost cost;
   const std::size_t heapBefore = StartCountingHeap();
   const double before = CpuSeconds();
-  try {
-    SsoClient::CreateSamlToken(xml, trusted);
-  } catch (const std::exception &error) {
-    cost.refusal = error.what();
-  }
+  cost.refusal = read(xml);
   cost.nanosecondsPerOctet = (CpuSeconds() - before) * 1e9 / static_cast<double>(xml.size());
   cost.heapOctets = GetMostHeap() - heapBefore;
   return cost;
@@ -75,10 +94,10 @@ bool TookTooLong(const Cost &cost, const std::string &xml) {
   return cost.nanosecondsPerOctet * static_cast<double>(xml.size()) > TOO_LONG_SECONDS * 1e9;
 }
 
-Cost Measure(const std::string &xml, const Tarvel::Crypto::CertificateList &trusted, int rounds) {
-  Cost best = MeasureOnce(xml, trusted);
+Cost Measure(const std::string &xml, const Reading &read, int rounds) {
+  Cost best = MeasureOnce(xml, read);
   for (int round = 1; round < rounds && !TookTooLong(best, xml); ++round) {
-    const Cost cost = MeasureOnce(xml, trusted);
+    const Cost cost = MeasureOnce(xml, read);
     best.nanosecondsPerOctet = std::min(best.nanosecondsPerOctet, cost.nanosecondsPerOctet);
   }
   return best;
@@ -105,14 +124,14 @@ struct Summary {
   std::size_t shapes = 0;
 };
 
-void MeasureShape(const HostileShape &shape, const Tarvel::Crypto::CertificateList &trusted, const Settings &settings,
+void MeasureShape(const HostileShape &shape, const std::string &title, const Reading &read, const Settings &settings,
                   Summary &summary) {
-  std::printf("%-72s", shape.name.c_str());
+  std::printf("%-72s", title.c_str());
   double first = 0;
   Cost cost;
   for (const std::size_t size : settings.sizes) {
     const std::string xml = shape.make(size);
-    cost = Measure(xml, trusted, settings.rounds);
+    cost = Measure(xml, read, settings.rounds);
     first = first == 0 ? cost.nanosecondsPerOctet : first;
     summary.ratio.Note(cost.nanosecondsPerOctet / summary.genuine, shape.name);
     // Growth below a genuine token's cost is ignored: its reason is that a large text no longer fits into the caches.
@@ -129,36 +148,56 @@ void MeasureShape(const HostileShape &shape, const Tarvel::Crypto::CertificateLi
   ++summary.shapes;
 }
 
-Summary MeasureAll(const Settings &settings) {
-  Tarvel::Crypto::CertificateList trusted;
-  for (const char *const file : {"/sts-rsa.crt", "/sts-rsa-2.crt", "/sts-ec256.crt", "/other.crt"}) {
-    trusted.push_back(Tarvel::Crypto::LoadCertificates(std::string(TOKEN_DATA_DIR) + file).front());
-  }
+Summary MeasureGenuine(const char *what, const Reading &read, const Settings &settings) {
   Summary summary;
-  const Cost genuine = Measure(ReadFile(LARGE_TOKEN), trusted, settings.rounds + 2);
+  const Cost genuine = Measure(ReadFile(LARGE_TOKEN), read, settings.rounds + 2);
   if (!genuine.refusal.empty()) {
     throw std::runtime_error("the genuine token is refused: " + genuine.refusal);
   }
   summary.genuine = genuine.nanosecondsPerOctet;
-  std::printf("%-72s %9.2f %26.1f MiB\n", "a genuine token of 5 MB, ns an octet and heap", summary.genuine,
-              static_cast<double>(genuine.heapOctets) / MIB);
-  for (const HostileShape &shape : MakeHostileShapes(ReadFile(TOKEN_DATA_DIR "/bearer.xml"))) {
-    MeasureShape(shape, trusted, settings, summary);
-  }
+  std::printf("%-72s %9.2f %26.1f MiB\n", what, summary.genuine, static_cast<double>(genuine.heapOctets) / MIB);
   return summary;
+}
+
+struct Summaries {
+  Summary verification;
+  Summary report;
+};
+
+Summaries MeasureAll(const Settings &settings) {
+  Tarvel::Crypto::CertificateList trusted;
+  for (const char *const file : {"/sts-rsa.crt", "/sts-rsa-2.crt", "/sts-ec256.crt", "/other.crt"}) {
+    trusted.push_back(Tarvel::Crypto::LoadCertificates(std::string(TOKEN_DATA_DIR) + file).front());
+  }
+  const Reading verify = Verifying(trusted);
+  const Reading explain = Explaining(trusted);
+  Summaries summaries{MeasureGenuine("a genuine token of 5 MB, ns an octet and heap", verify, settings),
+                      MeasureGenuine("  its report", explain, settings)};
+  for (const HostileShape &shape : MakeHostileShapes(ReadFile(TOKEN_DATA_DIR "/bearer.xml"))) {
+    MeasureShape(shape, shape.name, verify, settings, summaries.verification);
+    MeasureShape(shape, "  its report", explain, settings, summaries.report);
+  }
+  return summaries;
 }
 
 void WriteWorst(const char *name, double value, const std::string &shape, std::ostream &out) {
   out << ",\n  \"" << name << "\": {\"value\": " << value << ", \"shape\": \"" << shape << "\"}";
 }
 
-void WriteSummary(const Summary &summary, std::ostream &out) {
-  out << "{\n\"hostile_shapes\": {\"ratio\": " << summary.ratio.value << ", \"shapes\": " << summary.shapes
+void WriteFigures(const Summary &summary, std::ostream &out) {
+  out << "\"ratio\": " << summary.ratio.value << ", \"shapes\": " << summary.shapes
       << ", \"genuine_ns_per_octet\": " << summary.genuine;
   WriteWorst("worst_ratio", summary.ratio.value, summary.ratio.shape, out);
   WriteWorst("worst_growth", summary.growth.value, summary.growth.shape, out);
   WriteWorst("worst_heap_mib", summary.heap.value / MIB, summary.heap.shape, out);
-  out << "}\n}\n";
+}
+
+void WriteSummary(const Summaries &summaries, std::ostream &out) {
+  out << "{\n\"hostile_shapes\": {";
+  WriteFigures(summaries.verification, out);
+  out << ",\n  \"report\": {";
+  WriteFigures(summaries.report, out);
+  out << "}}\n}\n";
 }
 
 Settings ReadArguments(const std::vector<std::string> &arguments) {
@@ -186,13 +225,13 @@ void KeepMemory() {
 void Run(const std::vector<std::string> &arguments) {
   const Settings settings = ReadArguments(arguments);
   KeepMemory();
-  const Summary summary = MeasureAll(settings);
+  const Summaries summaries = MeasureAll(settings);
   if (settings.json.empty()) {
-    WriteSummary(summary, std::cout);
+    WriteSummary(summaries, std::cout);
     return;
   }
   std::ofstream file(settings.json);
-  WriteSummary(summary, file);
+  WriteSummary(summaries, file);
   if (!file.flush()) {
     throw std::runtime_error("cannot write " + settings.json);
   }

@@ -1,11 +1,18 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// Compares verifying a token with the cryptography that no verification can avoid, and with xmlsec1.
+/// Compares verifying a token with the cryptography that no verification can avoid, and with xmlsec1; one `TokenVerifier` for
+/// many tokens with a call of `CreateSamlToken` for each; and the report on a token with its verification.
+///
+/// Keys of the JSON that are not self-explanatory: "ours" is `CreateSamlToken`. "verifier" has an entry for each number of
+/// trusted certificates: "factory_us" is `CreateSamlToken`, "verifier_us" is `TokenVerifier::Verify`, both for the token of
+/// 5 KB, and "ratio" divides the second by the first. "explain" has the time of `TokenVerifier::Explain` for tokens of 5 KB
+/// and 50 KB, and its ratio to that of `Verify`.
 
 #include "program.h"
 #include "xmlsec_verifier.h"
 
 #include <ssoclient/create_saml_token.h>
+#include <ssoclient/token_verifier.h>
 
 #include <benchmark/benchmark.h>
 #include <openssl/evp.h>
@@ -13,7 +20,9 @@
 #include <openssl/rsa.h>
 
 #include <array>
+#include <cstddef>
 #include <cstdio>
+#include <iterator>
 #include <memory>
 #include <ostream>
 #include <stdexcept>
@@ -50,6 +59,9 @@ const std::string &GetSmallToken() {
 
 constexpr int THREAD_COUNTS[] = {1, 2, 4, 8, 16};
 
+/// Of the tokens of 5 KB and 50 KB.
+constexpr std::size_t EXPLAINED_TOKENS[] = {1, 2};
+
 const Tarvel::Crypto::CertificateList &GetTrusted() {
   static const Tarvel::Crypto::CertificateList trusted = Tarvel::Crypto::LoadCertificates(CERTIFICATE_FILE);
   return trusted;
@@ -59,6 +71,54 @@ void VerifyByUs(benchmark::State &state, const std::string &xml) {
   const Tarvel::Crypto::CertificateList &trusted = GetTrusted();
   for (auto _ : state) {
     benchmark::DoNotOptimize(SsoClient::CreateSamlToken(xml, trusted));
+  }
+}
+
+/// The files of 16 different certificates. The last is the one that made the signatures, as in a list to which new keys are
+/// added at the front.
+constexpr const char *CERTIFICATE_FILES[] = {
+    "tokens/other.crt",     "tokens/sts-rsa-2.crt",  "tokens/sts-rsa3072.crt", "tokens/sts-rsa-expired.crt",
+    "tokens/sts-ec256.crt", "tokens/sts-ec384.crt",  "tokens/sts-ec521.crt",   "tokens/holder.crt",
+    "crypto/rsa2048.crt",   "crypto/p256.crt",       "crypto/names.crt",       "tls/authority.crt",
+    "tls/client.crt",       "tokens/sts-rsa-e3.crt", "tokens/sts-rsa-e1.crt",  "tokens/sts-rsa.crt"};
+
+constexpr std::size_t KEY_COUNTS[] = {1, 2, 16};
+
+/// The last `count` of the 16 certificates.
+Tarvel::Crypto::CertificateList TrustedOf(std::size_t count) {
+  Tarvel::Crypto::CertificateList trusted;
+  for (std::size_t i = std::size(CERTIFICATE_FILES) - count; i < std::size(CERTIFICATE_FILES); ++i) {
+    trusted.push_back(
+        Tarvel::Crypto::LoadCertificates(std::string(TOKEN_DATA_DIR "/../") + CERTIFICATE_FILES[i]).front());
+  }
+  return trusted;
+}
+
+void VerifyByFactory(benchmark::State &state, std::size_t keys) {
+  const Tarvel::Crypto::CertificateList trusted = TrustedOf(keys);
+  for (auto _ : state) {
+    benchmark::DoNotOptimize(SsoClient::CreateSamlToken(GetSmallToken(), trusted));
+  }
+}
+
+void VerifyByVerifier(benchmark::State &state, std::size_t keys) {
+  const SsoClient::TokenVerifier verifier(TrustedOf(keys));
+  for (auto _ : state) {
+    benchmark::DoNotOptimize(verifier.Verify(GetSmallToken()));
+  }
+}
+
+void Verify(benchmark::State &state, const std::string &xml) {
+  const SsoClient::TokenVerifier verifier(GetTrusted());
+  for (auto _ : state) {
+    benchmark::DoNotOptimize(verifier.Verify(xml));
+  }
+}
+
+void Explain(benchmark::State &state, const std::string &xml) {
+  const SsoClient::TokenVerifier verifier(GetTrusted());
+  for (auto _ : state) {
+    benchmark::DoNotOptimize(verifier.Explain(xml));
   }
 }
 
@@ -150,6 +210,16 @@ void RegisterBenchmarks() {
     add("CreateSamlToken/" + size, VerifyByUs, xml);
   }
   add("xmlsec1/5k", VerifyByXmlsec, GetSmallToken());
+  for (const std::size_t keys : KEY_COUNTS) {
+    const std::string name = "/keys:" + std::to_string(keys);
+    benchmark::RegisterBenchmark(("Factory" + name).c_str(), VerifyByFactory, keys)->Unit(benchmark::kMicrosecond);
+    benchmark::RegisterBenchmark(("Verifier" + name).c_str(), VerifyByVerifier, keys)->Unit(benchmark::kMicrosecond);
+  }
+  for (const std::size_t index : EXPLAINED_TOKENS) {
+    const auto &[size, xml] = GetTokens()[index];
+    add("Verify/" + size, Verify, xml);
+    add("Explain/" + size, Explain, xml);
+  }
   for (const int threads : THREAD_COUNTS) {
     add("Limit/scaling", CheckLimit, GetSmallToken())->Threads(threads)->UseRealTime();
     add("CreateSamlToken/scaling", VerifyByUs, GetSmallToken())->Threads(threads)->UseRealTime();
@@ -185,6 +255,30 @@ void WriteThreads(const Medians &medians, std::ostream &out) {
   }
 }
 
+void WriteVerifiers(const Medians &medians, std::ostream &out) {
+  const char *separator = "";
+  for (const std::size_t keys : KEY_COUNTS) {
+    const std::string count = std::to_string(keys);
+    const double factory = medians.at("Factory/keys:" + count).cpuUs;
+    const double verifier = medians.at("Verifier/keys:" + count).cpuUs;
+    out << separator << "\"keys_" << count << "\": {\"factory_us\": " << factory << ", \"verifier_us\": " << verifier
+        << ", \"ratio\": " << verifier / factory << '}';
+    separator = ",\n    ";
+  }
+}
+
+void WriteReports(const Medians &medians, std::ostream &out) {
+  const char *separator = "";
+  for (const std::size_t index : EXPLAINED_TOKENS) {
+    const std::string &size = GetTokens()[index].size;
+    const double verify = medians.at("Verify/" + size).cpuUs;
+    const double explain = medians.at("Explain/" + size).cpuUs;
+    out << separator << '"' << size << "\": {\"explain_us\": " << explain << ", \"verify_us\": " << verify
+        << ", \"ratio\": " << explain / verify << '}';
+    separator = ", ";
+  }
+}
+
 // Times are microseconds of the measuring thread's CPU.
 void WriteSummary(const Medians &medians, std::ostream &out) {
   const double ours = medians.at("CreateSamlToken/5k").cpuUs;
@@ -208,7 +302,11 @@ void WriteSummary(const Medians &medians, std::ostream &out) {
   WriteSizes(medians, out);
   out << "],\n  \"threads\": [";
   WriteThreads(medians, out);
-  out << "]}\n}\n";
+  out << "],\n  \"verifier\": {";
+  WriteVerifiers(medians, out);
+  out << "},\n  \"explain\": {";
+  WriteReports(medians, out);
+  out << "}}\n}\n";
 }
 
 } // namespace

@@ -1,7 +1,8 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
 /// Signatures: reading and verifying the first `Signature` element of any document ends in an answer or in a documented
-/// exception, the same each time; and the content that a genuine signature covers is content that a trusted key signed.
+/// exception, the same each time; the report on it agrees and throws nothing; and the content that a genuine signature
+/// covers is content that a trusted key signed.
 
 #include "document_order.h"
 #include "support/data_file.h"
@@ -106,6 +107,15 @@ struct Verdict {
   std::set<std::string> uris;
 };
 
+/// Whether the report says what the verification did.
+bool Agrees(const Tarvel::Xml::Security::SignatureReport &report, const std::string &verdict) {
+  if (report.refusals.empty()) {
+    return verdict == "genuine";
+  }
+  const std::string &message = report.refusals.front().message;
+  return verdict == (message.empty() ? "wrong" : message);
+}
+
 Verdict Judge(const Tarvel::Xml::Security::Signature &signature) {
   static const auto resolver = Tarvel::Xml::Security::CreateTrustSetKeyResolver(
       {Tarvel::Crypto::LoadCertificates(Testing::DataPath("tokens/sts-rsa.crt")).front(),
@@ -119,6 +129,7 @@ Verdict Judge(const Tarvel::Xml::Security::Signature &signature) {
     Require(verdict.uris.empty());
     verdict.text = exception.what();
   }
+  Require(Agrees(signature.Explain(*resolver), verdict.text));
   return verdict;
 }
 

@@ -45,6 +45,14 @@ set(CPACK_DEBIAN_GSSAPI-DEVELOPMENT_PACKAGE_DEPENDS
   "libssoclient-gssapi${PROJECT_VERSION_MAJOR} (= ${PROJECT_VERSION}), libssoclient-dev (= ${PROJECT_VERSION})")
 set(CPACK_DEBIAN_TOOLS_PACKAGE_NAME ssoclient)
 set(CPACK_DEBIAN_TOOLS_PACKAGE_SECTION utils)
+# dpkg-shlibdeps does not know packages that are being made. Statically linked, the tool needs none of them.
+if(BUILD_SHARED_LIBS)
+  set(CPACK_DEBIAN_TOOLS_PACKAGE_DEPENDS "libssoclient${PROJECT_VERSION_MAJOR} (= ${PROJECT_VERSION})")
+  if(TARGET ssoclient_gssapi)
+    string(APPEND CPACK_DEBIAN_TOOLS_PACKAGE_DEPENDS
+      ", libssoclient-gssapi${PROJECT_VERSION_MAJOR} (= ${PROJECT_VERSION})")
+  endif()
+endif()
 set(CPACK_DEBIAN_DEVSTS_PACKAGE_NAME ssoclient-devsts)
 set(CPACK_DEBIAN_DEVSTS_PACKAGE_SECTION devel)
 

@@ -5,11 +5,13 @@
 #include "gss_name.h"
 
 #include <ssoclient/gssapi/exceptions.h>
+#include <ssoclient/logger.h>
 
 #include <gssapi/gssapi_ext.h>
 
 #include <algorithm>
 #include <cstdint>
+#include <cstring>
 #include <string>
 #include <utility>
 
@@ -38,6 +40,32 @@ void ValidateSettings(const SpnegoSettings &settings) {
   }
 }
 
+void WriteObserverFailure(const char *function, const char *text) noexcept {
+  try {
+    LogInternal(getLogger(), LOG_LEVEL_CONTRACT_WARNING, "The negotiation observer's %1 threw: %2",
+                std::string(function), std::string(text));
+  } catch (...) {
+    // Without memory the line is lost, but the negotiation goes on. NOLINT(bugprone-empty-catch)
+  }
+}
+
+bool IsKerberos(gss_OID mechanism) noexcept {
+  const gss_OID kerberos = KerberosMechanism();
+  return mechanism != GSS_C_NO_OID && mechanism->length == kerberos->length &&
+         std::memcmp(mechanism->elements, kerberos->elements, kerberos->length) == 0;
+}
+
+/// Logs the exception that is being handled.
+void LogObserverFailure(const char *function) noexcept {
+  try {
+    throw;
+  } catch (const std::exception &exception) {
+    WriteObserverFailure(function, exception.what());
+  } catch (...) {
+    WriteObserverFailure(function, "an exception that is not a std::exception");
+  }
+}
+
 } // namespace
 
 std::shared_ptr<SpnegoHandler> CreateSpnegoHandler(const SpnegoSettings &settings) {
@@ -52,8 +80,20 @@ SpnegoHandlerImpl::SpnegoHandlerImpl(const SpnegoSettings &settings, Clock clock
 
 std::shared_ptr<std::vector<std::uint8_t>>
 SpnegoHandlerImpl::NegotiateLeg(const std::vector<std::uint8_t> &serviceLeg) {
+  const int number = m_legs + 1;
+  const auto start = m_settings.observer ? m_clock() : std::chrono::steady_clock::time_point();
   try {
-    return std::make_shared<std::vector<std::uint8_t>>(MakeLeg(serviceLeg));
+    auto leg = std::make_shared<std::vector<std::uint8_t>>(MakeLeg(serviceLeg));
+    if (m_settings.observer) {
+      const auto duration = std::chrono::duration_cast<std::chrono::microseconds>(m_clock() - start);
+      ReportLeg({number, serviceLeg.size(), leg->size(), "", m_state == State::COMPLETE, IsMutuallyAuthenticated(),
+                 duration.count()});
+    }
+    return leg;
+  } catch (const std::exception &failure) {
+    m_state = State::FAILED;
+    ReportFailure(number, failure);
+    throw;
   } catch (...) {
     m_state = State::FAILED;
     throw;
@@ -116,16 +156,18 @@ std::vector<std::uint8_t> SpnegoHandlerImpl::AdvanceContext(const std::vector<st
       GSS_C_MUTUAL_FLAG | GSS_C_INTEG_FLAG | (m_settings.dceStyle ? OM_uint32{GSS_C_DCE_STYLE} : 0);
   GssOctets leg;
   OM_uint32 flags = 0;
+  gss_OID mechanism = GSS_C_NO_OID;
   GssStatus status;
   status.major =
       gss_init_sec_context(&status.minor, m_credential->Get(), m_context.Slot(), m_service.Get(), SpnegoMechanism(),
                            wanted, GSS_C_INDEFINITE, GSS_C_NO_CHANNEL_BINDINGS,
-                           input.empty() ? GSS_C_NO_BUFFER : &inputBuffer, nullptr, leg.Slot(), &flags, nullptr);
+                           input.empty() ? GSS_C_NO_BUFFER : &inputBuffer, &mechanism, leg.Slot(), &flags, nullptr);
   if (status.IsError()) {
     // A leg with which the GSSAPI reports the failure to the service is not sent: the operation ends here.
     throw GssNegotiationException("The negotiation with " + m_settings.service +
                                   " failed: " + DescribeStatus(status, SpnegoMechanism()));
   }
+  m_isKerberos = IsKerberos(mechanism);
   if ((status.major & GSS_S_CONTINUE_NEEDED) == 0) {
     CompleteWith(flags);
   } else {
@@ -140,6 +182,26 @@ void SpnegoHandlerImpl::CompleteWith(OM_uint32 contextFlags) {
                                   " was not authenticated: the mechanism does not support it");
   }
   m_state = State::COMPLETE;
+}
+
+void SpnegoHandlerImpl::ReportLeg(NegotiationLegEvent event) const noexcept {
+  try {
+    event.mechanism = m_isKerberos ? "Kerberos 5" : "";
+    m_settings.observer->OnLeg(event);
+  } catch (...) {
+    LogObserverFailure("OnLeg");
+  }
+}
+
+void SpnegoHandlerImpl::ReportFailure(int leg, const std::exception &failure) const noexcept {
+  if (!m_settings.observer) {
+    return;
+  }
+  try {
+    m_settings.observer->OnFailed(leg, failure);
+  } catch (...) {
+    LogObserverFailure("OnFailed");
+  }
 }
 
 void SpnegoHandlerImpl::CountLeg() {

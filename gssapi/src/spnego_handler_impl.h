@@ -12,6 +12,7 @@
 
 #include <chrono>
 #include <cstdint>
+#include <exception>
 #include <functional>
 #include <memory>
 #include <optional>
@@ -43,6 +44,8 @@ private:
   std::vector<std::uint8_t> AdvanceContext(const std::vector<std::uint8_t> &serviceLeg);
   void CompleteWith(OM_uint32 contextFlags);
   void CountLeg();
+  void ReportLeg(NegotiationLegEvent event) const noexcept;
+  void ReportFailure(int leg, const std::exception &failure) const noexcept;
   void CheckTime() const;
 
   const SpnegoSettings m_settings;
@@ -53,6 +56,7 @@ private:
   std::chrono::steady_clock::time_point m_start;        // of the first leg
   std::unique_ptr<const ClientCredential> m_credential; // null until the first leg
   ContextHandle m_context;
+  bool m_isKerberos = false; // whether Kerberos has been chosen
 };
 
 } // namespace SsoClient::Gssapi

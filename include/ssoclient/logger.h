@@ -12,11 +12,12 @@ namespace SsoClient {
 /// The level of lines about the start, the requests, the result and the end of operations. The logger's initial level.
 constexpr int LOG_LEVEL_OPERATION = 64;
 
-/// The level of the warning about the leg that a negotiation handler returned for the service's final leg.
+/// The level of warnings: about the leg that a negotiation handler returned for the service's final leg, and about an
+/// observer or a sink of refused tokens that threw an exception.
 constexpr int LOG_LEVEL_CONTRACT_WARNING = 8;
 
-/// The library's logger. Its name is "SsoClient", and its level is 64 until the host sets another. It is made on first use
-/// and lives until the process ends. Any thread may use it. Nothing is printed until the host installs a sink at
+/// The library's logger. Its name is "SsoClient", and its level is 64 until the host sets another. It is made on first
+/// use and lives until the process ends. Any thread may use it. Nothing is printed until the host installs a sink at
 /// `Tarvel::Service::GetApp().GetRootLogger()`.
 SSOCLIENT_API Tarvel::Service::Logger &getLogger();
 

@@ -35,8 +35,7 @@ struct ResponseReceivedEvent {
   int leg = 0;                           ///< as in `RequestSentEvent`
 };
 
-/// The service answered with a SOAP fault. Each text is cut at `Tarvel::StringUtil::MAX_VALUE_BYTES`, has "***" in the place of
-/// secrets, and is printable (`Tarvel::StringUtil::Printable`).
+/// The service answered with a SOAP fault.
 struct FaultEvent {
   std::string codeNamespace; ///< of the fault code; empty if its prefix is not bound
   std::string codeName;      ///< the local name of the fault code
@@ -50,21 +49,30 @@ struct OperationEndedEvent {
   /// The kinds of outcome.
   enum class Outcome : std::int32_t { SUCCEEDED = 0, FAILED };
 
-  Outcome outcome = Outcome::SUCCEEDED;
-  std::string exceptionClass; ///< the unqualified name of the failure's class; empty if the operation succeeded
-  std::string message; ///< the failure's text, cut and masked as in `FaultEvent`; empty if the operation succeeded
+  Outcome outcome = Outcome::SUCCEEDED; ///< whether the operation returned a result or threw an exception
+  /// The unqualified name of the failure's class. It and the message are empty if the operation succeeded, and if it
+  /// failed and there was no memory for them.
+  std::string exceptionClass;
+  std::string message;                   ///< the failure's text
   std::int64_t durationMicroseconds = 0; ///< since the operation started
 };
 
-/// Implemented by the caller, and called on the thread that runs the operation. Operations run on several threads at once, so the
-/// functions must be safe on any thread. They must not block, since the operation waits for them, and must not throw: what they throw
-/// is written to the log (logger "SsoClient") and changes nothing else.
+/// The caller implements the functions that it needs; the others do nothing. The thread that runs the operation calls
+/// them. Operations run on several threads at once, so the functions must be safe on any thread. They must not block,
+/// since the operation waits for them, and must not throw: what they throw is written to the log (logger "SsoClient",
+/// level 8) and changes nothing else.
 ///
-/// The events of one operation come in this order: started; for each message request sent, response received, and a fault if the
-/// response is one; ended. "Ended" comes exactly once for each "started", also after a failure.
+/// The events of one operation arrive in this order: started; for each message request sent, response received, and a
+/// fault if the response is one; ended. There is exactly one "ended" for each "started", also after a failure.
 ///
-/// No event contains a secret: no password, no text of a token, no value of a signature. If the service repeats the operation's
-/// password in a fault, "***" is in its place. Names of persons may occur in the texts of a service.
+/// No event contains a secret: no password, no text of a token, no value of a signature. If the service repeats the
+/// operation's password in a fault, "***" is in its place. Names of persons may occur in the texts of a service.
+///
+/// Texts of the service and of exceptions are printable (`Tarvel::StringUtil::Printable`) and cut at
+/// `Tarvel::StringUtil::MAX_VALUE_BYTES` bytes. In them, "***" replaces each secret of the operation as it is, escaped
+/// for XML and in Base64, and all markup of tokens, signatures and passwords. This may hide more than necessary: a
+/// password of one letter is masked in each word. If there is not enough memory to mask secrets, each text is "***"; if
+/// there is not enough for an event, the event is missing, except "ended", which then has no texts.
 class SSOCLIENT_API OperationObserver {
 public:
   /// An operation has started. Nothing is composed or sent yet.

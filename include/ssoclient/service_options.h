@@ -23,7 +23,7 @@ struct ServiceOptions {
   /// How the tokens that come back are verified.
   VerifyOptions verifyOptions;
 
-  /// Follows the operations; null for none. Shared until the service and its operations are gone.
+  /// Follows the operations; null for none. Shared until the service and its operations are released.
   std::shared_ptr<OperationObserver> observer;
 
   /// Called for each refused token; empty for none.

@@ -27,27 +27,27 @@ namespace SsoClient {
 /// use `TokenVerifier::Verify` to get a token. An empty optional means that the text does not say it, or not in a form that
 /// can be read. Texts are as the sender wrote them, so they may contain control characters.
 struct UnverifiedClaims {
-  bool isAssertion = false; ///< whether the text contains an assertion; if not, nothing else is set
-  boost::optional<std::string> id;
-  boost::optional<std::string> issuer;
-  boost::optional<Tarvel::System::DateTime> issueInstant;
-  boost::optional<std::string> nameId;       ///< the subject's identifier as written
-  boost::optional<std::string> nameIdFormat; ///< the `Format` of the subject's identifier
-  boost::optional<PrincipalId> subject;      ///< set if the identifier is a user principal name
-  boost::optional<SamlToken::ConfirmationType> confirmation;
-  boost::optional<std::string> confirmationMethod; ///< as written; set for methods that are not known, too
-  boost::optional<Tarvel::System::DateTime> startDate;
-  boost::optional<Tarvel::System::DateTime> endDate;
-  boost::optional<bool> renewable;
-  boost::optional<bool> delegable;
-  boost::optional<bool> solution;
+  bool isAssertion = false;            ///< whether the text contains an assertion; if not, nothing else is set
+  boost::optional<std::string> id;     ///< the `ID`
+  boost::optional<std::string> issuer; ///< the text of the `Issuer`
+  boost::optional<Tarvel::System::DateTime> issueInstant;    ///< when it was issued, as the issuer states
+  boost::optional<std::string> nameId;                       ///< the subject's identifier as written
+  boost::optional<std::string> nameIdFormat;                 ///< the `Format` of the subject's identifier
+  boost::optional<PrincipalId> subject;                      ///< set if the identifier is a user principal name
+  boost::optional<SamlToken::ConfirmationType> confirmation; ///< set if the method is known
+  boost::optional<std::string> confirmationMethod;           ///< as written; set for methods that are not known, too
+  boost::optional<Tarvel::System::DateTime> startDate;       ///< valid from this instant
+  boost::optional<Tarvel::System::DateTime> endDate;         ///< no longer valid at this instant
+  boost::optional<bool> renewable;                           ///< whether the service may renew it
+  boost::optional<bool> delegable;                           ///< whether it may be delegated
+  boost::optional<bool> solution;                            ///< whether its subject is a solution
   boost::optional<std::pair<std::string, std::string>> fullName; ///< first name and last name
   std::vector<PrincipalId> groups;                               ///< those that can be read
   std::vector<Delegate> delegationChain;                         ///< those that can be read
-  std::set<std::string> audience;
-  std::vector<Advice> advice;
-  /// Of a holder-of-key token: the subject and the SHA-256 thumbprint of the certificate, as texts. They are empty for
-  /// other tokens.
+  std::set<std::string> audience;                                ///< empty also if there is no restriction
+  std::vector<Advice> advice;                                    ///< those that can be read
+  /// The subject and the SHA-256 thumbprint of the certificate in a holder-of-key token, as texts; empty for other
+  /// tokens.
   std::string certificateSubject;
   std::string certificateThumbprint;
 };
@@ -56,8 +56,8 @@ struct UnverifiedClaims {
 /// earlier one has failed.
 ///
 /// All texts except `refusal` and `claims` are printable: characters that could control a terminal are written as \\uXXXX
-/// (`Tarvel::StringUtil::Printable`), and a text is cut at `Tarvel::StringUtil::MAX_VALUE_BYTES`. A report holds no secret and no
-/// token, but names of persons and groups. It refers to nothing outside itself, except to the trusted certificates.
+/// (`Tarvel::StringUtil::Printable`), and a text is cut at `Tarvel::StringUtil::MAX_VALUE_BYTES`. A report contains names of
+/// persons and groups, but no secret and no token. It refers to nothing outside itself, except to the trusted certificates.
 struct TokenReport {
   /// The checks, in the order of the verification.
   enum class Check : std::int32_t {
@@ -86,49 +86,52 @@ struct TokenReport {
 
   /// One thing for which a token is refused.
   struct Finding {
-    std::string message;      ///< the text of the exception with which `Verify` would refuse it
-    std::string element;      ///< the name of the element as written; empty if the finding has no place
-    std::string attribute;    ///< the name of the attribute; empty if the finding is about the element
-    std::string path;         ///< from the document element to the element, such as "/saml2:Assertion/saml2:Subject"
+    std::string message;   ///< the text of the exception with which `Verify` would refuse it
+    std::string element;   ///< the name of the element as written; empty if the finding has no place
+    std::string attribute; ///< the name of the attribute; empty if the finding is about the element
+    /// From the topmost element to the element, such as "/saml2:Assertion/saml2:Subject"; "[n]" after a name means the
+    /// n-th element of that name under its parent, and "[?]" one with too many nodes before it to count them.
+    std::string path;
     std::uint32_t line = 0;   ///< of the element's start tag, or of the error in the text; from 1; 0: unknown
     std::uint32_t column = 0; ///< from 1, in bytes; 0: unknown
     std::string wanted;       ///< what is allowed or expected there; may be empty
     std::string found;        ///< what is there; may be empty
-    std::int64_t missedBySec =
-        0;              ///< of a time: by how many seconds this machine's clock misses it, after the tolerance
+    /// By how many seconds, rounded up, this machine's clock is outside the validity period with its tolerance; 0 for
+    /// findings that are not about the clock.
+    std::int64_t missedBySec = 0;
     std::string remedy; ///< what the reader can do about it; may be empty
   };
 
   /// One check.
   struct CheckResult {
-    Check check = Check::WELL_FORMED;
-    Outcome outcome = Outcome::NOT_DONE;
-    std::string summary;              ///< what was looked at and found, in one sentence
-    std::vector<Finding> findings;    ///< in the order in which the verification meets them; empty unless FAILED
-    std::size_t unlistedFindings = 0; ///< further findings that are left out because of `MAX_FINDINGS`
+    Check check = Check::WELL_FORMED;    ///< which check
+    Outcome outcome = Outcome::NOT_DONE; ///< its outcome
+    std::string summary;                 ///< what was looked at and found, in one sentence
+    std::vector<Finding> findings;       ///< in the order in which the verification meets them; empty unless FAILED
+    std::size_t unlistedFindings = 0;    ///< further findings that are left out because of `MAX_FINDINGS`
   };
 
   /// One reference of the signature.
   struct Reference {
-    std::string uri;
+    std::string uri;                     ///< the `URI`
     bool resolves = false;               ///< to exactly one element, or to the document
     bool coversToken = false;            ///< its target is the assertion or the document that contains it
     std::string target;                  ///< the name of the target element; "document" for the whole document
     std::vector<std::string> transforms; ///< their algorithms, in order
-    std::string digestMethod;
-    std::string digestWanted;   ///< as the signature has it, in Base64
-    std::string digestComputed; ///< in Base64; empty if it cannot be computed
-    bool digestMatches = false;
+    std::string digestMethod;            ///< its algorithm
+    std::string digestWanted;            ///< as the signature has it, in Base64
+    std::string digestComputed;          ///< in Base64; empty if it cannot be computed
+    bool digestMatches = false;          ///< whether the two digests are the same
   };
 
   /// One trusted key.
   struct TrustedKey {
     Tarvel::Ref<const Tarvel::Crypto::Certificate> certificate; ///< never null; one of those that the verifier trusts
-    std::string subject;
-    std::string thumbprint;     ///< SHA-256, as `Certificate::GetSha256Thumbprint`
-    bool isNamed = false;       ///< the signature's `KeyInfo` contains this certificate
-    bool isUsable = false;      ///< it can be used with the signature's algorithm
-    bool madeSignature = false; ///< it made the signature
+    std::string subject;                                        ///< of the certificate; empty if it cannot be read
+    std::string thumbprint;                                     ///< SHA-256, as `Certificate::GetSha256Thumbprint`
+    bool isNamed = false;                                       ///< the signature's `KeyInfo` contains this certificate
+    bool isUsable = false;                                      ///< it can be used with the signature's algorithm
+    bool madeSignature = false;                                 ///< it made the signature
   };
 
   /// A certificate in the signature's `KeyInfo`. It is shown only; it never becomes a key.
@@ -138,7 +141,8 @@ struct TokenReport {
     bool isTrusted = false; ///< it is one of the trusted certificates; otherwise it is a stranger's
   };
 
-  /// The maximum number of findings in a report. Further ones are only counted.
+  /// The maximum number of findings in a report. Further ones are only counted, but each check that failed lists at least
+  /// one.
   static constexpr std::size_t MAX_FINDINGS = 1000;
 
   bool accepted = false; ///< whether `Verify` would return a token; exactly when no check has failed or was not done
@@ -153,7 +157,8 @@ struct TokenReport {
   Tarvel::System::DateTime checkedAt;              ///< this machine's clock when the times were checked
   UnverifiedClaims claims;
 
-  /// The result of `check`. Never null in a report that `TokenVerifier::Explain` returned.
+  /// The result of `check`, which every report of `TokenVerifier::Explain` has.
+  /// @throws Tarvel::InvalidArgumentException when a report that was made in another way has no such check.
   SSOCLIENT_API const CheckResult &Get(Check check) const;
 
   /// The first check that failed, or null.
@@ -166,8 +171,8 @@ SSOCLIENT_API const char *GetCheckName(TokenReport::Check check) noexcept;
 /// The name of an outcome: "passed", "failed" or "not done".
 SSOCLIENT_API const char *GetOutcomeName(TokenReport::Outcome outcome) noexcept;
 
-/// `report` as text for a log or a person: one line for each check, and below it one for each finding. Printable, and ends
-/// in a line end.
+/// `report` as text for a log or a person: a line with the verdict, one for each check, and below it a few for each finding.
+/// Without `claims`, which are not verified. Printable except for its line ends, the last of which is at its end.
 SSOCLIENT_API std::string WriteTokenReport(const TokenReport &report);
 
 } // namespace SsoClient

@@ -45,13 +45,15 @@ public:
 
   /// Runs the checks of `Verify` on `xml`, goes on after a failure, and reports each check. `accepted` is true exactly
   /// when `Verify` returns a token at the same moment. Nothing in the report may be trusted: it is not a token. If `xml`
-  /// is well-formed but its document element is not an assertion, the first assertion in it is reported, too; the
-  /// report is then not accepted.
+  /// is well-formed but its document element is not an assertion, the report also shows the first assertion in it, and
+  /// does not accept it. It takes linear time, but more than `Verify`, for example because it computes the digests even if
+  /// no trusted key made the signature. Call it when a person wants to know why a token is refused, not for each token.
   /// @throws Tarvel::OutOfMemoryException, std::bad_alloc and Tarvel::InvalidStateException like `Verify`, and nothing else:
   ///         no text in `xml` makes it throw.
   TokenReport Explain(const std::string &xml) const;
 
-  /// The same for an element that is parsed already.
+  /// The same for an element that is parsed already. If the element has no canonical form, the check WELL_FORMED fails. The tree
+  /// must not be changed during the call; the report does not keep a reference to it.
   TokenReport Explain(const Tarvel::Xml::ElementNode &element) const;
 
 private:

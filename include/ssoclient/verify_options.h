@@ -25,6 +25,7 @@ enum class TokenProfile : std::int32_t {
 /// What is checked of a token, in addition to its form, its consistency and its signature. The defaults are those of
 /// `CreateSamlToken`.
 struct VerifyOptions {
+  /// The form that a token must have.
   TokenProfile profile = TokenProfile::STRICT;
 
   /// How far this machine's clock may be wrong, in seconds. A negative tolerance shortens the time in which a token is

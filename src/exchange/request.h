@@ -4,6 +4,9 @@
 
 #pragma once
 
+#include "exchange/response_facts.h"
+
+#include <memory>
 #include <string>
 
 namespace SsoClient {
@@ -26,6 +29,9 @@ struct Request {
 
   std::string soapAction; ///< value of the `SOAPAction` HTTP header, without quotes
   std::string body;       ///< the whole envelope; secret
+
+  /// Where the transport puts the facts of the response. Null, the default, if nobody wants to know them.
+  std::shared_ptr<ResponseFacts> facts;
 };
 
 } // namespace SsoClient

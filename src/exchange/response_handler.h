@@ -6,16 +6,18 @@
 
 #pragma once
 
+#include "exchange/fault_listener.h"
 #include "exchange/spnego_response.h"
 
 #include <tarvel/io/reader.h>
 
+#include <memory>
 #include <string>
 
 namespace SsoClient {
 
-/// Reads the response of each operation. Each call reads the whole body from the reader, which the caller owns. Any number of
-/// threads may use one handler. All functions throw on a SOAP fault and on a malformed response.
+/// Reads the response of each operation. Each call reads the whole body from the reader, which the caller owns. Any
+/// number of threads may use one handler. All functions throw on a SOAP fault and on a malformed response.
 class ResponseHandler {
 public:
   /// Sets `tokenXml` to the token of an issue response.
@@ -29,6 +31,13 @@ public:
 
   /// Sets all fields of `spnego` to the service's response to one leg of a negotiation.
   virtual void HandleSPNegoResponse(Tarvel::Reader *response, SPNegoResponse &spnego) const = 0;
+
+  /// A handler that does the same, and also shows each fault to `listener`, which must outlive it. Null if this handler
+  /// cannot do that.
+  virtual std::shared_ptr<const ResponseHandler> WithFaultListener(FaultListener &listener) const {
+    static_cast<void>(listener);
+    return nullptr;
+  }
 
 protected:
   ResponseHandler() = default;

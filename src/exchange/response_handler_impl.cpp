@@ -17,9 +17,9 @@ using Tarvel::Xml::ElementNode;
 
 /// The result of `extractor` for the body of a response that is not a fault. The name of the root element is ignored.
 template <typename Extractor>
-auto ProcessResponseWith(Tarvel::Reader &response, const Extractor &extractor) {
+auto ProcessResponseWith(Tarvel::Reader &response, const Extractor &extractor, FaultListener *listener) {
   const Tarvel::Ref<const ElementNode> envelope = ParseResponseDocument(response);
-  CheckSoapFault(*envelope);
+  CheckSoapFault(*envelope, listener);
   const ElementNode *const body = envelope->FindChildElement("Body");
   if (!body) {
     // "SAOP" is the established spelling of the message.
@@ -31,22 +31,26 @@ auto ProcessResponseWith(Tarvel::Reader &response, const Extractor &extractor) {
 } // namespace
 
 void ResponseHandlerImpl::HandleAcquireTokenResponse(Tarvel::Reader *response, std::string &tokenXml) const {
-  tokenXml = ProcessResponseWith(*response, ExtractIssuedToken);
+  tokenXml = ProcessResponseWith(*response, ExtractIssuedToken, m_listener);
 }
 
 bool ResponseHandlerImpl::HandleValidateSubjectResponse(Tarvel::Reader *response) const {
-  return ProcessResponseWith(*response, ExtractValidationStatus);
+  return ProcessResponseWith(*response, ExtractValidationStatus, m_listener);
 }
 
 void ResponseHandlerImpl::HandleRenewTokenResponse(Tarvel::Reader *response, std::string &tokenXml) const {
-  tokenXml = ProcessResponseWith(*response, ExtractRenewedToken);
+  tokenXml = ProcessResponseWith(*response, ExtractRenewedToken, m_listener);
 }
 
 void ResponseHandlerImpl::HandleSPNegoResponse(Tarvel::Reader *response, SPNegoResponse &spnego) const {
-  SPNegoResponse leg = ProcessResponseWith(*response, ExtractSPNegoLeg);
+  SPNegoResponse leg = ProcessResponseWith(*response, ExtractSPNegoLeg, m_listener);
   spnego.contextId.swap(leg.contextId);
   spnego.leg.swap(leg.leg);
   spnego.tokenXml.swap(leg.tokenXml);
+}
+
+std::shared_ptr<const ResponseHandler> ResponseHandlerImpl::WithFaultListener(FaultListener &listener) const {
+  return std::make_shared<const ResponseHandlerImpl>(&listener);
 }
 
 } // namespace SsoClient

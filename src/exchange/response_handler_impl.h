@@ -8,8 +8,9 @@
 
 namespace SsoClient {
 
-/// Parses the body, turns a SOAP fault into an exception, and extracts the result of the operation. It has no state, so any
-/// number of threads may use one handler. A call that throws does not change its out argument.
+/// Parses the body, turns a SOAP fault into an exception, and extracts the result of the operation. It has no state
+/// except the listener, so any number of threads may use one handler without a listener. A call that throws does not
+/// change its out argument.
 ///
 /// All functions throw
 /// - `InvalidCredentialsException` when the service refused the caller's credentials,
@@ -18,10 +19,17 @@ namespace SsoClient {
 /// - `Tarvel::Xml::Security::XmlSecurityException` for an assertion that has no canonical form.
 class ResponseHandlerImpl final : public ResponseHandler {
 public:
+  /// @param listener is shown each fault; null for none. It must outlive the handler.
+  explicit ResponseHandlerImpl(FaultListener *listener = nullptr) noexcept : m_listener(listener) {}
+
   void HandleAcquireTokenResponse(Tarvel::Reader *response, std::string &tokenXml) const override;
   bool HandleValidateSubjectResponse(Tarvel::Reader *response) const override;
   void HandleRenewTokenResponse(Tarvel::Reader *response, std::string &tokenXml) const override;
   void HandleSPNegoResponse(Tarvel::Reader *response, SPNegoResponse &spnego) const override;
+  std::shared_ptr<const ResponseHandler> WithFaultListener(FaultListener &listener) const override;
+
+private:
+  FaultListener *m_listener;
 };
 
 } // namespace SsoClient

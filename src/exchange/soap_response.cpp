@@ -68,10 +68,13 @@ Ref<const ElementNode> ParseResponseDocument(Tarvel::Reader &response) {
   return Ref<const ElementNode>(document->GetDocumentElement());
 }
 
-void CheckSoapFault(const ElementNode &envelope) {
+void CheckSoapFault(const ElementNode &envelope, FaultListener *listener) {
   const ElementNode *const fault = FindDescendant(&envelope, {"Body", "Fault"});
   if (!fault) {
     return;
+  }
+  if (listener) {
+    listener->OnFault(*fault);
   }
   const ElementNode *const faultCode = fault->FindChildElement("faultcode");
   const TextNode *const codeText = GetTextNode(faultCode);

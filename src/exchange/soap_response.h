@@ -4,6 +4,8 @@
 
 #pragma once
 
+#include "exchange/fault_listener.h"
+
 #include <tarvel/core/ref.h>
 #include <tarvel/io/reader.h>
 #include <tarvel/xml/node.h>
@@ -19,13 +21,14 @@ namespace SsoClient {
 Tarvel::Ref<const Tarvel::Xml::ElementNode> ParseResponseDocument(Tarvel::Reader &response);
 
 /// Checks that there is no SOAP 1.1 fault in the body of `envelope`.
+/// @param listener is shown the fault before the exception is thrown; null for none
 /// @throws InvalidCredentialsException for a fault that says that authentication failed.
 /// @throws SsoException for every other fault.
 /// @throws ParseException for a fault code whose prefix is not bound.
-void CheckSoapFault(const Tarvel::Xml::ElementNode &envelope);
+void CheckSoapFault(const Tarvel::Xml::ElementNode &envelope, FaultListener *listener = nullptr);
 
-/// Follows a path of local names down from `start`, to the first child with each name. Null when there is no such child, and
-/// when `start` is null.
+/// Follows a path of local names down from `start`, to the first child with each name. Null when there is no such
+/// child, and when `start` is null.
 const Tarvel::Xml::ElementNode *FindDescendant(const Tarvel::Xml::ElementNode *start,
                                                std::initializer_list<std::string_view> localNames) noexcept;
 

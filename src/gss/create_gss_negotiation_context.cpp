@@ -18,13 +18,19 @@ constexpr std::int64_t LEG_TIMEOUT_MICROSECONDS = 40000000;
 
 std::shared_ptr<GssNegotiationContext> CreateGssNegotiationContext(const SecurityTokenServiceConfig &config,
                                                                    const TokenSpec &spec) {
+  return CreateGssNegotiationContext(config, spec, ServiceOptions());
+}
+
+std::shared_ptr<GssNegotiationContext> CreateGssNegotiationContext(const SecurityTokenServiceConfig &config,
+                                                                   const TokenSpec &spec,
+                                                                   const ServiceOptions &options) {
   auto requestBuilder = std::make_shared<const RequestBuilderImpl>(config.holderOfKeyConfig);
   // `useDomainControllerName` is ignored, because the Kerberos ticket is for the host in the address.
   const HttpsClient client(config.stsUrl, Tarvel::Ref<Tarvel::Ssl::SSLContext>(config.sslContext), config.sslParameter,
                            LEG_TIMEOUT_MICROSECONDS);
   auto responseHandler = std::make_shared<const ResponseHandlerImpl>();
   return std::make_shared<GssNegotiationContextImpl>(spec, std::move(requestBuilder), client.CreateSession(),
-                                                     std::move(responseHandler), config.signingCertificates);
+                                                     std::move(responseHandler), config.signingCertificates, options);
 }
 
 } // namespace SsoClient::InternalApi

@@ -2,7 +2,6 @@
 
 #include "gss/gss_negotiation_context_impl.h"
 
-#include <ssoclient/create_saml_token.h>
 #include <tarvel/core/exception.h>
 #include <tarvel/core/ref.h>
 #include <tarvel/io/reader.h>
@@ -15,36 +14,50 @@ GssNegotiationContextImpl::GssNegotiationContextImpl(const TokenSpec &spec,
                                                      std::shared_ptr<const RequestBuilder> requestBuilder,
                                                      std::shared_ptr<TransportSession> session,
                                                      std::shared_ptr<const ResponseHandler> responseHandler,
-                                                     const Tarvel::Crypto::CertificateList &signingCertificates)
+                                                     const Tarvel::Crypto::CertificateList &signingCertificates,
+                                                     const ServiceOptions &options)
     : m_spec(spec), m_requestBuilder(std::move(requestBuilder)), m_session(std::move(session)),
-      m_responseHandler(std::move(responseHandler)), m_signingCertificates(signingCertificates) {
-  if (m_signingCertificates.empty()) {
+      m_responseHandler(std::move(responseHandler)), m_returnedTokens(signingCertificates, options),
+      m_observer(options.observer) {
+  if (signingCertificates.empty()) {
     throw Tarvel::InvalidArgumentException("No STS trusted certificates provided");
   }
 }
 
 GssNegotiationResult GssNegotiationContextImpl::NegotiateToken(const std::vector<std::uint8_t> &leg) {
-  const SPNegoResponse response = Exchange(leg);
+  const std::string newId;
+  OperationEvents events(m_observer.get(), "NegotiateToken", newId);
+  return events.Run([&] { return Negotiate(leg, events); });
+}
+
+GssNegotiationResult GssNegotiationContextImpl::Negotiate(const std::vector<std::uint8_t> &leg,
+                                                          OperationEvents &events) {
+  events.SetLeg(m_answeredLegs + 1);
+  events.HideLeg(leg);
+  const SPNegoResponse response = Exchange(leg, events);
+  events.HideLeg(response.leg);
+  ++m_answeredLegs;
   m_contextId = response.contextId;
   GssNegotiationResult result;
   result.serverLeg = std::make_shared<std::vector<std::uint8_t>>(response.leg);
   if (!response.tokenXml.empty()) {
-    result.token = CreateSamlToken(response.tokenXml, m_signingCertificates);
+    result.token = m_returnedTokens.Verify(response.tokenXml, events);
   }
   return result;
 }
 
-SPNegoResponse GssNegotiationContextImpl::Exchange(const std::vector<std::uint8_t> &leg) const {
+SPNegoResponse GssNegotiationContextImpl::Exchange(const std::vector<std::uint8_t> &leg,
+                                                   OperationEvents &events) const {
   Request request;
   if (m_contextId.empty()) {
     m_requestBuilder->BuildInitialSPNegoRequest(m_spec, leg, request);
   } else {
     m_requestBuilder->BuildContinuedSPNegoRequest(m_contextId, leg, request);
   }
-  Tarvel::Ref<Tarvel::Reader> body;
-  m_session->SendRequest(request, body);
+  const Tarvel::Ref<Tarvel::Reader> body = events.Send(*m_session, request);
   SPNegoResponse response;
-  m_responseHandler->HandleSPNegoResponse(body.get(), response);
+  events.Receive(*m_responseHandler,
+                 [&](const ResponseHandler &handler) { handler.HandleSPNegoResponse(body.get(), response); });
   return response;
 }
 

@@ -17,13 +17,25 @@ constexpr std::int64_t REQUEST_TIMEOUT_MICROSECONDS = 240000000;
 } // namespace
 
 std::shared_ptr<SecurityTokenService> CreateSecurityTokenService(const SecurityTokenServiceConfig &config) {
+  return CreateSecurityTokenService(config, ServiceOptions());
+}
+
+std::shared_ptr<SecurityTokenService> CreateSecurityTokenService(const SecurityTokenServiceConfig &config,
+                                                                 const std::shared_ptr<OperationObserver> &observer) {
+  ServiceOptions options;
+  options.observer = observer;
+  return CreateSecurityTokenService(config, options);
+}
+
+std::shared_ptr<SecurityTokenService> CreateSecurityTokenService(const SecurityTokenServiceConfig &config,
+                                                                 const ServiceOptions &options) {
   auto requestBuilder = std::make_shared<const RequestBuilderImpl>(config.holderOfKeyConfig);
   auto transport = std::make_shared<const HttpsClient>(
       config.stsUrl, Tarvel::Ref<Tarvel::Ssl::SSLContext>(config.sslContext), config.sslParameter,
       REQUEST_TIMEOUT_MICROSECONDS, config.useDomainControllerName);
   auto responseHandler = std::make_shared<const ResponseHandlerImpl>();
   return std::make_shared<SecurityTokenServiceImpl>(std::move(requestBuilder), std::move(transport),
-                                                    std::move(responseHandler), config.signingCertificates);
+                                                    std::move(responseHandler), config.signingCertificates, options);
 }
 
 } // namespace SsoClient

@@ -8,14 +8,17 @@
 
 namespace SsoClient {
 
-/// Logs the start when it is created and the end when it is destroyed, after a return or an exception. Both lines have the
-/// same new UUID.
+/// Logs the start when it is created and the end when it is destroyed, after a return or an exception. Both lines have
+/// the same new UUID.
 class OperationFrame {
 public:
   explicit OperationFrame(const std::string &operationName);
   OperationFrame(const OperationFrame &) = delete;
   OperationFrame &operator=(const OperationFrame &) = delete;
   ~OperationFrame();
+
+  /// The UUID.
+  const std::string &GetId() const noexcept { return m_opId; }
 
 private:
   std::string m_opId;

@@ -6,9 +6,12 @@
 
 #include "exchange/request_builder.h"
 #include "exchange/response_handler.h"
+#include "operation/operation_events.h"
+#include "operation/returned_tokens.h"
 #include "transport/transport.h"
 
 #include <ssoclient/security_token_service.h>
+#include <ssoclient/service_options.h>
 #include <tarvel/core/ref.h>
 #include <tarvel/crypto/certificate.h>
 #include <tarvel/io/reader.h>
@@ -20,14 +23,16 @@
 
 namespace SsoClient {
 
-/// Coordinates three collaborators, which compose requests, send them and read responses. Copies share the collaborators,
-/// which must be safe on any thread. An asynchronous operation runs on a copy, so it may outlive the service that started it.
+/// Coordinates three collaborators, which compose requests, send them and read responses. Copies share the
+/// collaborators, which must be safe on any thread. An asynchronous operation runs on a copy, so it may outlive the
+/// service that started it.
 class SecurityTokenServiceImpl final : public SecurityTokenService {
 public:
   SecurityTokenServiceImpl(std::shared_ptr<const RequestBuilder> requestBuilder,
                            std::shared_ptr<const Transport> transport,
                            std::shared_ptr<const ResponseHandler> responseHandler,
-                           const Tarvel::Crypto::CertificateList &signingCertificates);
+                           const Tarvel::Crypto::CertificateList &signingCertificates,
+                           const ServiceOptions &options = {});
   SecurityTokenServiceImpl(const SecurityTokenServiceImpl &) = default;
 
   std::shared_ptr<const SamlToken> AcquireToken(const std::string &username, const std::string &password,
@@ -54,33 +59,45 @@ public:
   /// @throws what `CreateSamlToken` throws, except that a ParseException becomes an SsoException with the same message.
   std::shared_ptr<const SamlToken> ToSamlToken(const std::string &xml) const;
 
+  /// The same, as a part of the operation that has these events.
+  std::shared_ptr<const SamlToken> ToSamlToken(const std::string &xml, OperationEvents &events) const;
+
   /// Sends the first leg of a negotiation and sets `spnego` to the service's response.
   void StartSPNegotiation(TransportSession &session, const std::vector<std::uint8_t> &leg, const TokenSpec &spec,
                           SPNegoResponse &spnego) const;
+  void StartSPNegotiation(TransportSession &session, const std::vector<std::uint8_t> &leg, const TokenSpec &spec,
+                          SPNegoResponse &spnego, OperationEvents &events) const;
 
   /// The same for a later leg. `contextId` may refer to the text in `spnego`.
   void ContinueSPNegotiation(TransportSession &session, const std::vector<std::uint8_t> &leg,
                              const std::string &contextId, SPNegoResponse &spnego) const;
+  void ContinueSPNegotiation(TransportSession &session, const std::vector<std::uint8_t> &leg,
+                             const std::string &contextId, SPNegoResponse &spnego, OperationEvents &events) const;
 
 private:
   using ReadTokenXml = void (ResponseHandler::*)(Tarvel::Reader *, std::string &) const;
 
-  /// Posts in a new session. Session and request are destroyed before this returns, so that a password in the request does
-  /// not stay in memory while the response is processed.
-  Tarvel::Ref<Tarvel::Reader> Send(Request &&request) const;
+  /// Runs `operation` once with its events, between the first and the last line of its log.
+  template <typename Operation>
+  auto Run(const char *name, const Operation &operation) const;
+  /// Posts in a new session. Session and request are destroyed before this returns, so that a password in the request
+  /// does not stay in memory while the response is processed.
+  Tarvel::Ref<Tarvel::Reader> Send(Request &&request, OperationEvents &events) const;
   /// The verified token that `readTokenXml` finds in `response`; null when the text that it finds is empty.
   std::shared_ptr<const SamlToken>
-  AcquireFrom(const Tarvel::Ref<Tarvel::Reader> &response,
+  AcquireFrom(const Tarvel::Ref<Tarvel::Reader> &response, OperationEvents &events,
               ReadTokenXml readTokenXml = &ResponseHandler::HandleAcquireTokenResponse) const;
-  void SendLeg(TransportSession &session, const Request &request, SPNegoResponse &spnego) const;
+  void SendLeg(TransportSession &session, Request &request, SPNegoResponse &spnego, OperationEvents &events) const;
   /// Exchanges legs until the service issues a token or something throws.
-  void Negotiate(const TokenSpec &spec, NegotiationHandler &handler, SPNegoResponse &spnego) const;
+  void Negotiate(const TokenSpec &spec, NegotiationHandler &handler, SPNegoResponse &spnego,
+                 OperationEvents &events) const;
   std::shared_ptr<const SecurityTokenService> ShareCopy() const;
 
   std::shared_ptr<const RequestBuilder> m_requestBuilder;
   std::shared_ptr<const Transport> m_transport;
   std::shared_ptr<const ResponseHandler> m_responseHandler;
-  Tarvel::Crypto::CertificateList m_signingCertificates;
+  std::shared_ptr<const ReturnedTokens> m_returnedTokens;
+  std::shared_ptr<OperationObserver> m_observer;
 };
 
 } // namespace SsoClient

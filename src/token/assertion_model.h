@@ -3,7 +3,12 @@
 /// The parsed form of one SAML 2.0 assertion: a record for each schema type of the accepted profile.
 ///
 /// The records and their fields have the names of the schema's types, elements and attributes. The parser fills them, and the
-/// checks and the token read them. They exist only while a token is made.
+/// checks and the token read them. They exist only while a token is made. Pointers to elements and views are valid as long
+/// as the tree.
+///
+/// A field that could not be read, which happens only if the parser goes on after a deviation, has its default value: an
+/// empty text, the `DateTime` of its default constructor, or null. A record whose element was not found has a null
+/// `element`.
 
 #pragma once
 
@@ -12,6 +17,7 @@
 #include <tarvel/core/ref.h>
 #include <tarvel/crypto/certificate.h>
 #include <tarvel/system/date_time.h>
+#include <tarvel/xml/node.h>
 #include <tarvel/xml/security/signature.h>
 
 #include <boost/optional.hpp>
@@ -19,26 +25,34 @@
 #include <cstdint>
 #include <set>
 #include <string>
+#include <string_view>
 #include <vector>
 
 namespace SsoClient {
 
 struct NameIDType {
   std::string Format;
-  std::string value; ///< the element's text
+  std::string value;                                 ///< the element's text
+  const Tarvel::Xml::ElementNode *element = nullptr; ///< where it is; not compared
 
-  friend bool operator==(const NameIDType &, const NameIDType &) = default;
+  friend bool operator==(const NameIDType &left, const NameIDType &right) {
+    return left.Format == right.Format && left.value == right.value;
+  }
 };
 
 struct SubjectConfirmationDataType {
   Tarvel::System::DateTime NotOnOrAfter;                      ///< set for bearer
   Tarvel::Ref<const Tarvel::Crypto::Certificate> certificate; ///< set for holder-of-key
+  const Tarvel::Xml::ElementNode *element = nullptr;
 };
 
 struct SubjectConfirmationType {
   SamlToken::ConfirmationType Method = SamlToken::BEARER;
   boost::optional<NameIDType> NameID; ///< the delegate, if there is one
   SubjectConfirmationDataType SubjectConfirmationData;
+  const Tarvel::Xml::ElementNode *element = nullptr;
+  boost::optional<std::string_view> writtenMethod; ///< the attribute's value; empty if there is no such attribute
+  bool isMethodKnown = false;                      ///< whether `Method` is what the attribute says
 };
 
 struct SubjectType {
@@ -60,7 +74,7 @@ struct DelegateType {
 };
 
 struct DelegationRestrictionType {
-  std::vector<DelegateType> delegates; ///< in document order, at least one
+  std::vector<DelegateType> delegates; ///< in document order, at least one after a parse without deviations
 };
 
 struct AudienceRestrictionType {
@@ -74,6 +88,7 @@ struct ConditionsType {
   boost::optional<DelegationRestrictionType> DelegationRestriction;
   boost::optional<AudienceRestrictionType> AudienceRestriction;
   boost::optional<ProxyRestrictionType> ProxyRestriction;
+  const Tarvel::Xml::ElementNode *element = nullptr;
 };
 
 struct AdviceType {
@@ -93,7 +108,8 @@ struct AttributeType {
   std::string Name;
   std::string NameFormat;          ///< empty when absent
   std::string FriendlyName;        ///< empty when absent
-  std::vector<std::string> values; ///< one for each AttributeValue, in document order
+  std::vector<std::string> values; ///< one for each AttributeValue that could be read, in document order
+  const Tarvel::Xml::ElementNode *element = nullptr;
 };
 
 struct AttributeStatementType {
@@ -111,6 +127,7 @@ struct SamlAssertionType {
   boost::optional<AdviceType> Advice;
   AuthnStatementType AuthnStatement;
   boost::optional<AttributeStatementType> AttributeStatement;
+  const Tarvel::Xml::ElementNode *element = nullptr; ///< the assertion that was read
 };
 
 } // namespace SsoClient

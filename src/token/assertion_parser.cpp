@@ -7,31 +7,96 @@
 #include "token/statement_parser.h"
 #include "token/subject_parser.h"
 #include "token/token_signature.h"
+#include "xml/qualified_name.h"
 #include "xml/strict_checks.h"
 
 namespace SsoClient {
 
-using Tarvel::Xml::ElementNode;
+namespace {
 
-void ParseSamlAssertionElement(NodeFilterIterator &iterator, SamlAssertionType &assertion) {
-  const ElementNode &element = RequireElementQName(IteratorToElement(iterator), "Assertion", Namespaces::SAML);
-  RequireElementAttributesNames(element, {"Version", "ID", "IssueInstant"}, {});
+using Tarvel::Xml::ElementNode;
+using Tarvel::Xml::Node;
+
+/// The node after `node` in document order, if it is below `top`; otherwise null.
+const Node *NextBelow(const Node *node, const Node *top) {
+  if (node->GetFirstChild()) {
+    return node->GetFirstChild();
+  }
+  while (node != top && !node->GetNextSibling()) {
+    node = node->GetParent();
+  }
+  return node == top ? nullptr : node->GetNextSibling();
+}
+
+/// The first SAML 2.0 assertion in the tree of `top` or, if there is none, the first element of that name.
+const ElementNode *FindAssertion(const Node *top) {
+  const ElementNode *inOtherNamespace = nullptr;
+  for (const Node *node = top; node; node = NextBelow(node, top)) {
+    const ElementNode *const element = Tarvel::Xml::AsElement(node);
+    if (ElementQNameIs(element, "Assertion", Namespaces::SAML)) {
+      return element;
+    }
+    if (!inOtherNamespace && element && element->GetLocalName() == "Assertion") {
+      inOtherNamespace = element;
+    }
+  }
+  return inOtherNamespace;
+}
+
+/// Reads the attribute statement at the cursor, or an advice that is not in its place, and skips any other node.
+void ReadAttributesOrAdvice(NodeFilterIterator &iterator, SamlAssertionType &assertion, DeviationSink &sink) {
+  if (ElementQNameIs(IteratorToElement(iterator), "AttributeStatement", Namespaces::SAML)) {
+    if (!assertion.AttributeStatement) {
+      assertion.AttributeStatement.emplace();
+    }
+    ParseAttributeStatementElement(iterator, *assertion.AttributeStatement, sink);
+  } else if (assertion.Advice || !TryParseAdviceElement(iterator, assertion.Advice, sink)) {
+    iterator.MoveToSibling();
+  }
+}
+
+void ParseStatements(NodeFilterIterator &iterator, SamlAssertionType &assertion, DeviationSink &sink) {
+  NodeFilterIterator skipped = iterator;
+  ParseAuthnStatementElement(iterator, assertion.AuthnStatement, sink);
+  // Other issuers write the statements in another order.
+  while (skipped.node != iterator.node) {
+    ReadAttributesOrAdvice(skipped, assertion, sink);
+  }
+  for (bool isRead = false; iterator.node;) {
+    if (isRead || !IteratorToElement(iterator)) {
+      RefuseFurtherNode(iterator, "Unexpected elements under Assertion", sink);
+    } else {
+      isRead = RequireElementQName(iterator, "AttributeStatement", Namespaces::SAML, sink);
+    }
+    ReadAttributesOrAdvice(iterator, assertion, sink);
+  }
+}
+
+void ParseAssertion(const NodeFilterIterator &iterator, const ElementNode &element, SamlAssertionType &assertion,
+                    DeviationSink &sink) {
+  RequireElementAttributesNames(element, {"Version", "ID", "IssueInstant"}, {}, sink);
+  assertion.element = &element;
   assertion.Version = GetTextAttribute(element, "Version");
   assertion.ID = GetTextAttribute(element, "ID");
-  GetDateAttribute(element, "IssueInstant", assertion.IssueInstant);
+  GetDateAttribute(element, "IssueInstant", assertion.IssueInstant, sink);
 
   NodeFilterIterator child = iterator.GetChild();
-  ParseSamlIssuerElement(child, assertion.Issuer);
-  ParseTokenSignature(child, element, assertion.Signature);
-  ParseSubjectElement(child, assertion.Subject);
-  ParseConditionsElement(child, assertion.Conditions);
-  TryParseAdviceElement(child, assertion.Advice);
-  ParseAuthnStatementElement(child, assertion.AuthnStatement);
-  if (IteratorToElement(child)) {
-    assertion.AttributeStatement.emplace();
-    ParseAttributeStatementElement(child, *assertion.AttributeStatement);
+  ParseSamlIssuerElement(child, assertion.Issuer, sink);
+  ParseTokenSignature(child, element, assertion.Signature, sink);
+  ParseSubjectElement(child, assertion.Subject, sink);
+  ParseConditionsElement(child, assertion.Conditions, sink);
+  TryParseAdviceElement(child, assertion.Advice, sink);
+  ParseStatements(child, assertion, sink);
+}
+
+} // namespace
+
+void ParseSamlAssertionElement(NodeFilterIterator &iterator, SamlAssertionType &assertion, DeviationSink &sink) {
+  const bool isAssertion = RequireElementQName(iterator, "Assertion", Namespaces::SAML, sink);
+  const ElementNode *const element = isAssertion ? IteratorToElement(iterator) : FindAssertion(iterator.node);
+  if (element) {
+    ParseAssertion(NodeFilterIterator(element, iterator.filter), *element, assertion, sink);
   }
-  RequireNoFurtherNode(child, "Unexpected elements under Assertion");
   iterator.MoveToSibling();
 }
 

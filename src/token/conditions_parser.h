@@ -3,11 +3,12 @@
 /// Readers of the conditions under which a token is valid.
 ///
 /// A `TryParse` function returns whether its element was at the cursor. If not, the cursor and the record stay
-/// unchanged.
+/// unchanged. `ParseDelegate` returns whether it found its element. If not, it has skipped another node.
 
 #pragma once
 
 #include "token/assertion_model.h"
+#include "xml/deviation_sink.h"
 #include "xml/node_filter_iterator.h"
 
 #include <boost/optional.hpp>
@@ -15,22 +16,27 @@
 namespace SsoClient {
 
 /// Reads a `saml:Conditions`: restrictions in any order, each kind at most once.
-void ParseConditionsElement(NodeFilterIterator &iterator, ConditionsType &conditions);
+void ParseConditionsElement(NodeFilterIterator &iterator, ConditionsType &conditions,
+                            DeviationSink &sink = ThrowingSink());
 
 /// Reads a `saml:Condition` of the type DelegationRestrictionType.
 bool TryParseDelegationRestriction(NodeFilterIterator &iterator,
-                                   boost::optional<DelegationRestrictionType> &restriction);
+                                   boost::optional<DelegationRestrictionType> &restriction,
+                                   DeviationSink &sink = ThrowingSink());
 
 /// Reads a `Delegate` of the delegation restriction.
-void ParseDelegate(NodeFilterIterator &iterator, DelegateType &delegate);
+bool ParseDelegate(NodeFilterIterator &iterator, DelegateType &delegate, DeviationSink &sink = ThrowingSink());
 
 /// Reads a `saml:AudienceRestriction`.
-bool TryParseAudienceRestriction(NodeFilterIterator &iterator, boost::optional<AudienceRestrictionType> &restriction);
+bool TryParseAudienceRestriction(NodeFilterIterator &iterator, boost::optional<AudienceRestrictionType> &restriction,
+                                 DeviationSink &sink = ThrowingSink());
 
 /// Reads a `saml:ProxyRestriction`.
-bool TryParseProxyRestriction(NodeFilterIterator &iterator, boost::optional<ProxyRestrictionType> &restriction);
+bool TryParseProxyRestriction(NodeFilterIterator &iterator, boost::optional<ProxyRestrictionType> &restriction,
+                              DeviationSink &sink = ThrowingSink());
 
 /// Reads a `saml:Condition` of the type RenewRestrictionType.
-bool TryParseRenewRestriction(NodeFilterIterator &iterator, boost::optional<RenewRestrictionType> &restriction);
+bool TryParseRenewRestriction(NodeFilterIterator &iterator, boost::optional<RenewRestrictionType> &restriction,
+                              DeviationSink &sink = ThrowingSink());
 
 } // namespace SsoClient

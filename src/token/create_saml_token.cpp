@@ -2,9 +2,7 @@
 
 #include <ssoclient/create_saml_token.h>
 
-#include "token/saml_token_impl.h"
-
-#include <tarvel/xml/security/key_info_resolver.h>
+#include <ssoclient/token_verifier.h>
 
 namespace SsoClient {
 
@@ -14,18 +12,18 @@ using Tarvel::Ref;
 using Tarvel::Crypto::Certificate;
 using Tarvel::Crypto::CertificateList;
 using Tarvel::Xml::ElementNode;
-using Tarvel::Xml::Security::KeyInfoResolver;
 
-/// Resolves only to keys of `trusted`. Null references are ignored.
-Ref<KeyInfoResolver> ResolverFor(const CertificateList &trusted) {
-  return Tarvel::Xml::Security::CreateTrustSetKeyResolver(trusted);
+TokenVerifier VerifierFor(const CertificateList &trusted, std::int64_t clockToleranceSec) {
+  VerifyOptions options;
+  options.clockToleranceSec = clockToleranceSec;
+  return TokenVerifier(trusted, options);
 }
 
 } // namespace
 
 std::shared_ptr<const SamlToken> CreateSamlToken(const std::string &xml, const CertificateList &trustedCertificates,
                                                  std::int64_t clockToleranceSec) {
-  return std::make_shared<SamlTokenImpl>(xml, *ResolverFor(trustedCertificates), clockToleranceSec);
+  return VerifierFor(trustedCertificates, clockToleranceSec).Verify(xml);
 }
 
 std::shared_ptr<const SamlToken> CreateSamlToken(const std::string &xml, const CertificateList &trustedCertificates) {
@@ -39,7 +37,7 @@ std::shared_ptr<const SamlToken> CreateSamlToken(const std::string &xml, const C
 std::shared_ptr<const SamlToken> CreateSamlTokenFromDom(const ElementNode &element,
                                                         const CertificateList &trustedCertificates,
                                                         std::int64_t clockToleranceSec) {
-  return std::make_shared<SamlTokenImpl>(element, *ResolverFor(trustedCertificates), clockToleranceSec);
+  return VerifierFor(trustedCertificates, clockToleranceSec).Verify(element);
 }
 
 std::shared_ptr<const SamlToken> CreateSamlTokenFromDom(const ElementNode &element,

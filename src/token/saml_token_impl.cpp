@@ -3,6 +3,7 @@
 #include "token/saml_token_impl.h"
 
 #include "token/assertion_parser.h"
+#include "token/signature_refusal.h"
 #include "token/token_checks.h"
 #include "xml/xml_text.h"
 
@@ -55,10 +56,10 @@ void SamlTokenImpl::ValidateSignature(const Signature &signature, const KeyInfoR
     std::set<std::string> signedUris;
     verified = signature.Verify(resolver, signedUris);
   } catch (const Tarvel::Xml::Security::XmlSecurityException &error) {
-    throw InvalidSignatureException(std::string("Signature verification error. ") + error.what());
+    throw InvalidSignatureException(SignatureRefusalText(error.what()));
   }
   if (!verified) {
-    throw InvalidSignatureException("Failed to verify signature: token might have been tampered with.");
+    throw InvalidSignatureException(SignatureRefusalText({}));
   }
 }
 

@@ -51,6 +51,8 @@ public:
   }
   const std::string &ToXml() const override { return m_xml; }
 
+  const TokenFacts &GetFacts() const noexcept { return m_facts; }
+
   /// @throws InvalidSignatureException unless `signature` verifies with one of the keys of `resolver`.
   static void ValidateSignature(const Tarvel::Xml::Security::Signature &signature,
                                 const Tarvel::Xml::Security::KeyInfoResolver &resolver);

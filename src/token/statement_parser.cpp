@@ -3,6 +3,7 @@
 #include "token/statement_parser.h"
 
 #include "model/namespaces.h"
+#include "xml/expected_element.h"
 #include "xml/qualified_name.h"
 #include "xml/strict_checks.h"
 
@@ -15,14 +16,17 @@ using Tarvel::Xml::ElementNode;
 
 namespace {
 
-void ParseAttributeValue(NodeFilterIterator &iterator, std::string &value) {
-  const ElementNode &element = RequireElementQName(IteratorToElement(iterator), "AttributeValue", Namespaces::SAML);
-  // Services may state the type of a value. It is ignored: every value is read as text.
-  if (element.GetFirstAttribute()) {
-    RequireElementAttributesQNames(element, {}, {XSI_TYPE});
+bool ParseAttributeValue(NodeFilterIterator &iterator, std::string &value, DeviationSink &sink) {
+  const NodeFilterIterator taken = TakeListElement(iterator, "AttributeValue", Namespaces::SAML, sink);
+  if (!taken.node) {
+    return false;
   }
-  RequireTextualContent(iterator, value);
-  iterator.MoveToSibling();
+  // Services may state the type of a value. It is ignored: every value is read as text.
+  const ElementNode &element = *IteratorToElement(taken);
+  if (element.GetFirstAttribute()) {
+    RequireElementAttributesQNames(element, {}, {XSI_TYPE}, sink);
+  }
+  return RequireTextualContent(taken, value, sink);
 }
 
 /// An upper limit of the number of SAML attributes: it counts each element with at least one XML attribute. The caller
@@ -39,75 +43,104 @@ std::size_t CountPossibleAttributes(const ElementNode &statement) {
 
 } // namespace
 
-bool TryParseAdviceElement(NodeFilterIterator &iterator, boost::optional<AdviceType> &advice) {
+bool TryParseAdviceElement(NodeFilterIterator &iterator, boost::optional<AdviceType> &advice, DeviationSink &sink) {
   const ElementNode *const element = IteratorToElement(iterator);
   if (!ElementQNameIs(element, "Advice", Namespaces::SAML)) {
     return false;
   }
-  RequireNoAttributes(*element);
+  RequireNoAttributes(*element, sink);
   advice.emplace();
   NodeFilterIterator child = iterator.GetChild();
   while (child.node) {
-    ParseRsaAdviceElement(child, advice->advice.emplace_back());
+    if (!ParseRsaAdviceElement(child, advice->advice.emplace_back(), sink)) {
+      advice->advice.pop_back();
+    }
   }
   iterator.MoveToSibling();
   return true;
 }
 
-void ParseRsaAdviceElement(NodeFilterIterator &iterator, Advice &advice) {
-  const ElementNode &element = RequireElementQName(IteratorToElement(iterator), "RSAAdvice", Namespaces::RSA_SAML2);
-  RequireElementAttributesNames(element, {"AdviceSource"}, {});
+bool ParseRsaAdviceElement(NodeFilterIterator &iterator, Advice &advice, DeviationSink &sink) {
+  const NodeFilterIterator taken = TakeListElement(iterator, "RSAAdvice", Namespaces::RSA_SAML2, sink);
+  if (!taken.node) {
+    return false;
+  }
+  const ElementNode &element = *IteratorToElement(taken);
+  RequireElementAttributesNames(element, {"AdviceSource"}, {}, sink);
   advice.source = GetTextAttribute(element, "AdviceSource");
-  NodeFilterIterator child = iterator.GetChild();
+  NodeFilterIterator child = taken.GetChild();
   while (child.node) {
     AttributeType attribute;
-    ParseAttributeElement(child, attribute);
-    advice.attributes.push_back({std::move(attribute.Name), std::move(attribute.values)});
+    if (ParseAttributeElement(child, attribute, sink)) {
+      advice.attributes.push_back({std::move(attribute.Name), std::move(attribute.values)});
+    }
   }
-  iterator.MoveToSibling();
+  return true;
 }
 
-void ParseAuthnStatementElement(NodeFilterIterator &iterator, AuthnStatementType &statement) {
-  const ElementNode &element = RequireElementQName(IteratorToElement(iterator), "AuthnStatement", Namespaces::SAML);
-  RequireElementAttributesNames(element, {"AuthnInstant"}, {});
-  GetDateAttribute(element, "AuthnInstant", statement.AuthnInstant);
-  NodeFilterIterator child = iterator.GetChild();
-  ParseAuthnContextElement(child, statement.AuthnContext);
-  RequireNoFurtherNode(child, "Unexpected elements after AuthnContext");
-  iterator.MoveToSibling();
+void ParseAuthnStatementElement(NodeFilterIterator &iterator, AuthnStatementType &statement, DeviationSink &sink) {
+  const NodeFilterIterator taken = TakeElement(iterator, "AuthnStatement", Namespaces::SAML, sink);
+  if (!taken.node) {
+    return;
+  }
+  const ElementNode &element = *IteratorToElement(taken);
+  RequireElementAttributesNames(element, {"AuthnInstant"}, {}, sink);
+  GetDateAttribute(element, "AuthnInstant", statement.AuthnInstant, sink);
+  NodeFilterIterator child = taken.GetChild();
+  ParseAuthnContextElement(child, statement.AuthnContext, sink);
+  RequireNoFurtherNode(child, "Unexpected elements after AuthnContext", sink);
 }
 
-void ParseAuthnContextElement(NodeFilterIterator &iterator, AuthnContextType &context) {
-  RequireNoAttributes(RequireElementQName(IteratorToElement(iterator), "AuthnContext", Namespaces::SAML));
-  NodeFilterIterator child = iterator.GetChild();
-  RequireNoAttributes(RequireElementQName(IteratorToElement(child), "AuthnContextClassRef", Namespaces::SAML));
-  RequireTextualContent(child, context.AuthnContextClassRef);
-  RequireNoFurtherNode(child.MoveToSibling(), "Unexpected elements after AuthnContextClassRef");
-  iterator.MoveToSibling();
+void ParseAuthnContextElement(NodeFilterIterator &iterator, AuthnContextType &context, DeviationSink &sink) {
+  const NodeFilterIterator taken = TakeElement(iterator, "AuthnContext", Namespaces::SAML, sink);
+  if (!taken.node) {
+    return;
+  }
+  RequireNoAttributes(*IteratorToElement(taken), sink);
+  NodeFilterIterator child = taken.GetChild();
+  const NodeFilterIterator reference = TakeElement(child, "AuthnContextClassRef", Namespaces::SAML, sink);
+  if (reference.node) {
+    RequireNoAttributes(*IteratorToElement(reference), sink);
+    RequireTextualContent(reference, context.AuthnContextClassRef, sink);
+  }
+  RequireNoFurtherNode(child, "Unexpected elements after AuthnContextClassRef", sink);
 }
 
-void ParseAttributeStatementElement(NodeFilterIterator &iterator, AttributeStatementType &statement) {
-  const ElementNode &element = RequireElementQName(IteratorToElement(iterator), "AttributeStatement", Namespaces::SAML);
-  RequireNoAttributes(element);
+void ParseAttributeStatementElement(NodeFilterIterator &iterator, AttributeStatementType &statement,
+                                    DeviationSink &sink) {
+  const NodeFilterIterator taken = TakeListElement(iterator, "AttributeStatement", Namespaces::SAML, sink);
+  if (!taken.node) {
+    return;
+  }
+  const ElementNode &element = *IteratorToElement(taken);
+  RequireNoAttributes(element, sink);
   statement.attributes.reserve(CountPossibleAttributes(element));
-  NodeFilterIterator child = iterator.GetChild();
+  NodeFilterIterator child = taken.GetChild();
   while (child.node) {
-    ParseAttributeElement(child, statement.attributes.emplace_back());
+    if (!ParseAttributeElement(child, statement.attributes.emplace_back(), sink)) {
+      statement.attributes.pop_back();
+    }
   }
-  iterator.MoveToSibling();
 }
 
-void ParseAttributeElement(NodeFilterIterator &iterator, AttributeType &attribute) {
-  const ElementNode &element = RequireElementQName(IteratorToElement(iterator), "Attribute", Namespaces::SAML);
-  RequireElementAttributesNames(element, {"Name"}, {"NameFormat", "FriendlyName"});
+bool ParseAttributeElement(NodeFilterIterator &iterator, AttributeType &attribute, DeviationSink &sink) {
+  const NodeFilterIterator taken = TakeListElement(iterator, "Attribute", Namespaces::SAML, sink);
+  if (!taken.node) {
+    return false;
+  }
+  const ElementNode &element = *IteratorToElement(taken);
+  RequireElementAttributesNames(element, {"Name"}, {"NameFormat", "FriendlyName"}, sink);
+  attribute.element = &element;
   attribute.Name = GetTextAttribute(element, "Name");
   attribute.NameFormat = GetTextAttribute(element, "NameFormat");
   attribute.FriendlyName = GetTextAttribute(element, "FriendlyName");
-  NodeFilterIterator child = iterator.GetChild();
+  NodeFilterIterator child = taken.GetChild();
   while (child.node) {
-    ParseAttributeValue(child, attribute.values.emplace_back());
+    if (!ParseAttributeValue(child, attribute.values.emplace_back(), sink)) {
+      attribute.values.pop_back();
+    }
   }
-  iterator.MoveToSibling();
+  return true;
 }
 
 } // namespace SsoClient

@@ -1,10 +1,13 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
 /// Readers of the statements of an assertion: advice, authentication and attributes.
+///
+/// The functions for elements of lists return whether they found their element. If not, they have skipped another node.
 
 #pragma once
 
 #include "token/assertion_model.h"
+#include "xml/deviation_sink.h"
 #include "xml/node_filter_iterator.h"
 
 #include <boost/optional.hpp>
@@ -12,21 +15,26 @@
 namespace SsoClient {
 
 /// Reads a `saml:Advice`. Returns whether one was at the cursor. If not, the cursor and the record stay unchanged.
-bool TryParseAdviceElement(NodeFilterIterator &iterator, boost::optional<AdviceType> &advice);
+bool TryParseAdviceElement(NodeFilterIterator &iterator, boost::optional<AdviceType> &advice,
+                           DeviationSink &sink = ThrowingSink());
 
 /// Reads an `RSAAdvice`, the advice of one source.
-void ParseRsaAdviceElement(NodeFilterIterator &iterator, Advice &advice);
+bool ParseRsaAdviceElement(NodeFilterIterator &iterator, Advice &advice, DeviationSink &sink = ThrowingSink());
 
 /// Reads a `saml:AuthnStatement`.
-void ParseAuthnStatementElement(NodeFilterIterator &iterator, AuthnStatementType &statement);
+void ParseAuthnStatementElement(NodeFilterIterator &iterator, AuthnStatementType &statement,
+                                DeviationSink &sink = ThrowingSink());
 
 /// Reads a `saml:AuthnContext`.
-void ParseAuthnContextElement(NodeFilterIterator &iterator, AuthnContextType &context);
+void ParseAuthnContextElement(NodeFilterIterator &iterator, AuthnContextType &context,
+                              DeviationSink &sink = ThrowingSink());
 
-/// Reads a `saml:AttributeStatement`.
-void ParseAttributeStatementElement(NodeFilterIterator &iterator, AttributeStatementType &statement);
+/// Reads a `saml:AttributeStatement` and adds its attributes to those that `statement` has.
+void ParseAttributeStatementElement(NodeFilterIterator &iterator, AttributeStatementType &statement,
+                                    DeviationSink &sink = ThrowingSink());
 
 /// Reads a `saml:Attribute`.
-void ParseAttributeElement(NodeFilterIterator &iterator, AttributeType &attribute);
+bool ParseAttributeElement(NodeFilterIterator &iterator, AttributeType &attribute,
+                           DeviationSink &sink = ThrowingSink());
 
 } // namespace SsoClient

@@ -5,32 +5,35 @@
 #pragma once
 
 #include "token/assertion_model.h"
+#include "xml/deviation_sink.h"
 #include "xml/node_filter_iterator.h"
 
 namespace SsoClient {
 
 /// Reads attributes and text of an element of the type NameIDType, whatever its name. The cursor must be on an element.
-void ParseNameIDType(NodeFilterIterator &iterator, NameIDType &nameId);
+void ParseNameIDType(NodeFilterIterator &iterator, NameIDType &nameId, DeviationSink &sink = ThrowingSink());
 
 /// Reads a `saml:Issuer`.
-void ParseSamlIssuerElement(NodeFilterIterator &iterator, NameIDType &issuer);
+void ParseSamlIssuerElement(NodeFilterIterator &iterator, NameIDType &issuer, DeviationSink &sink = ThrowingSink());
 
 /// Reads a `saml:NameID`.
-void ParseSubjectNameIdElement(NodeFilterIterator &iterator, NameIDType &nameId);
+void ParseSubjectNameIdElement(NodeFilterIterator &iterator, NameIDType &nameId, DeviationSink &sink = ThrowingSink());
 
 /// Reads a `saml:Subject`: one name and one confirmation.
-void ParseSubjectElement(NodeFilterIterator &iterator, SubjectType &subject);
+void ParseSubjectElement(NodeFilterIterator &iterator, SubjectType &subject, DeviationSink &sink = ThrowingSink());
 
 /// Reads a `saml:SubjectConfirmation` of the method bearer or holder-of-key.
-void ParseSubjectConfirmationElement(NodeFilterIterator &iterator, SubjectConfirmationType &confirmation);
+void ParseSubjectConfirmationElement(NodeFilterIterator &iterator, SubjectConfirmationType &confirmation,
+                                     DeviationSink &sink = ThrowingSink());
 
 /// Reads a `saml:SubjectConfirmationData`, whose form depends on `method`: bearer has an end of validity, holder-of-key a
 /// certificate.
 void ParseSubjectConfirmationDataElement(NodeFilterIterator &iterator, SamlToken::ConfirmationType method,
-                                         SubjectConfirmationDataType &data);
+                                         SubjectConfirmationDataType &data, DeviationSink &sink = ThrowingSink());
 
 /// Reads a `ds:KeyInfo` and its only certificate.
 void ParseSubjectConfirmationDataKeyInfoElement(NodeFilterIterator &iterator,
-                                                Tarvel::Ref<const Tarvel::Crypto::Certificate> &certificate);
+                                                Tarvel::Ref<const Tarvel::Crypto::Certificate> &certificate,
+                                                DeviationSink &sink = ThrowingSink());
 
 } // namespace SsoClient

@@ -3,65 +3,170 @@
 #include "token/token_checks.h"
 
 #include "xml/date_time_text.h"
+#include "xml/refuse.h"
 
-#include <ssoclient/exceptions.h>
+#include <algorithm>
+#include <string_view>
 
 namespace SsoClient {
 
 namespace {
 
-void CheckVersionAndId(const SamlAssertionType &assertion) {
-  if (assertion.Version != "2.0") {
-    throw ParseException("Invalid token version");
-  }
-  if (assertion.ID.empty() || assertion.ID.front() != '_') {
-    throw ParseException("Invalid token ID");
-  }
+using Tarvel::System::DateTime;
+using Tarvel::System::MICROSECONDS_PER_SECOND;
+using Tarvel::Xml::ElementNode;
+
+/// By how many microseconds `missed` exceeds `tolerance`, which is not larger. The difference may need all 64 bits.
+std::uint64_t Excess(std::int64_t missed, std::int64_t tolerance) {
+  return static_cast<std::uint64_t>(missed) - static_cast<std::uint64_t>(tolerance);
 }
 
-void CheckValidity(const ConditionsType &conditions, std::int64_t clockToleranceSec) {
-  if (!(conditions.NotBefore < conditions.NotOnOrAfter)) {
-    throw ParseException("Unsatisfiable token validity conditions: NotBefore must be less than NotOnOrAfter.");
-  }
+std::int64_t ToSeconds(std::uint64_t microseconds) {
+  return static_cast<std::int64_t>(microseconds / MICROSECONDS_PER_SECOND);
+}
+
+std::string ToleranceText(std::int64_t clockToleranceSec) {
+  return ", with a tolerance of " + std::to_string(clockToleranceSec) + " s";
+}
+
+void CheckStart(const ConditionsType &conditions, const DateTime &now, std::int64_t clockToleranceSec,
+                DeviationSink &sink) {
   // Compares differences of dates. It does not shift dates, because a shifted date cannot leave the years 1 to 9999.
   const std::int64_t tolerance = Tarvel::System::SecondsToMicroseconds(clockToleranceSec);
-  const Tarvel::System::DateTime now = Tarvel::System::GetUtcDateTime();
-  if (conditions.NotBefore.MicrosecondsSince(now) > tolerance) {
-    throw ParseException("Token start date is in the future: " + DateTimeFormatter(conditions.NotBefore));
-  }
-  if (now.MicrosecondsSince(conditions.NotOnOrAfter) >= tolerance) {
-    throw ParseException("The token has expired at: " + DateTimeFormatter(conditions.NotOnOrAfter));
-  }
-}
-
-void CheckSubjectValidity(const SamlAssertionType &assertion) {
-  const SubjectConfirmationType &confirmation = assertion.Subject.SubjectConfirmation;
-  if (confirmation.Method == SamlToken::BEARER &&
-      confirmation.SubjectConfirmationData.NotOnOrAfter < assertion.Conditions.NotOnOrAfter) {
-    throw ParseException("Invalid token subject validity");
+  const std::int64_t missed = conditions.NotBefore.MicrosecondsSince(now);
+  if (missed > tolerance) {
+    ReportDeviation(sink, [&] {
+      const std::string text = DateTimeFormatter(conditions.NotBefore);
+      return Deviation{"Token start date is in the future: " + text,
+                       conditions.element,
+                       "NotBefore",
+                       "at or before " + DateTimeFormatter(now) + ToleranceText(clockToleranceSec),
+                       text,
+                       ToSeconds(Excess(missed, tolerance) - 1) + 1};
+    });
   }
 }
 
-void CheckDelegation(const boost::optional<NameIDType> &delegateId,
-                     const boost::optional<DelegationRestrictionType> &restriction) {
-  if (delegateId && !restriction) {
-    throw ParseException("Token SubjectConfirmation contains delegate id, but no delegation restriction is present");
-  }
-  if (!delegateId && restriction) {
-    throw ParseException("Token has delegation restriction, but no delegate id is present in the SubjectConfirmation");
-  }
-  if (delegateId && (restriction->delegates.empty() || *delegateId != restriction->delegates.back().NameID)) {
-    throw ParseException("The SubjectConfirmation delegate id does not match the id of the last delegate");
+void CheckEnd(const ConditionsType &conditions, const DateTime &now, std::int64_t clockToleranceSec,
+              DeviationSink &sink) {
+  const std::int64_t tolerance = Tarvel::System::SecondsToMicroseconds(clockToleranceSec);
+  const std::int64_t missed = now.MicrosecondsSince(conditions.NotOnOrAfter);
+  if (missed >= tolerance) {
+    ReportDeviation(sink, [&] {
+      const std::string text = DateTimeFormatter(conditions.NotOnOrAfter);
+      return Deviation{"The token has expired at: " + text,
+                       conditions.element,
+                       "NotOnOrAfter",
+                       "after " + DateTimeFormatter(now) + ToleranceText(clockToleranceSec),
+                       text,
+                       ToSeconds(Excess(missed, tolerance)) + 1};
+    });
   }
 }
 
 } // namespace
 
 void CheckTokenProperties(const SamlAssertionType &assertion, std::int64_t clockToleranceSec) {
-  CheckVersionAndId(assertion);
-  CheckValidity(assertion.Conditions, clockToleranceSec);
-  CheckSubjectValidity(assertion);
-  CheckDelegation(assertion.Subject.SubjectConfirmation.NameID, assertion.Conditions.DelegationRestriction);
+  DeviationSink &sink = ThrowingSink();
+  CheckVersion(assertion, sink);
+  CheckId(assertion, sink);
+  CheckValidity(assertion.Conditions, clockToleranceSec, sink);
+  CheckSubjectValidity(assertion, sink);
+  CheckDelegation(assertion, sink);
+}
+
+void CheckVersion(const SamlAssertionType &assertion, DeviationSink &sink) {
+  if (assertion.Version != "2.0") {
+    Refuse(sink, {assertion.element, "Version"}, "2.0", assertion.Version, "Invalid token version");
+  }
+}
+
+void CheckId(const SamlAssertionType &assertion, DeviationSink &sink) {
+  if (assertion.ID.empty() || assertion.ID.front() != '_') {
+    Refuse(sink, {assertion.element, "ID"}, "a text that begins with \"_\"", assertion.ID, "Invalid token ID");
+  }
+}
+
+DateTime CheckValidity(const ConditionsType &conditions, std::int64_t clockToleranceSec, DeviationSink &sink) {
+  if (!(conditions.NotBefore < conditions.NotOnOrAfter)) {
+    Refuse(sink, {conditions.element, "NotBefore"}, "before " + DateTimeFormatter(conditions.NotOnOrAfter),
+           DateTimeFormatter(conditions.NotBefore),
+           "Unsatisfiable token validity conditions: NotBefore must be less than NotOnOrAfter.");
+  }
+  const DateTime now = Tarvel::System::GetUtcDateTime();
+  CheckStart(conditions, now, clockToleranceSec, sink);
+  CheckEnd(conditions, now, clockToleranceSec, sink);
+  return now;
+}
+
+void CheckSubjectValidity(const SamlAssertionType &assertion, DeviationSink &sink) {
+  const SubjectConfirmationType &confirmation = assertion.Subject.SubjectConfirmation;
+  const SubjectConfirmationDataType &data = confirmation.SubjectConfirmationData;
+  if (confirmation.Method == SamlToken::BEARER && data.NotOnOrAfter < assertion.Conditions.NotOnOrAfter) {
+    Refuse(sink, {data.element, "NotOnOrAfter"}, DateTimeFormatter(assertion.Conditions.NotOnOrAfter) + " or later",
+           DateTimeFormatter(data.NotOnOrAfter), "Invalid token subject validity");
+  }
+}
+
+void CheckDelegation(const SamlAssertionType &assertion, DeviationSink &sink) {
+  const SubjectConfirmationType &confirmation = assertion.Subject.SubjectConfirmation;
+  const boost::optional<DelegationRestrictionType> &restriction = assertion.Conditions.DelegationRestriction;
+  const NameIDType *const last =
+      restriction && !restriction->delegates.empty() ? &restriction->delegates.back().NameID : nullptr;
+  const std::string_view lastName = last ? std::string_view(last->value) : std::string_view();
+  if (confirmation.NameID && !restriction) {
+    Refuse(sink, confirmation.NameID->element, "no delegate id", confirmation.NameID->value,
+           "Token SubjectConfirmation contains delegate id, but no delegation restriction is present");
+  } else if (!confirmation.NameID && restriction) {
+    Refuse(sink, confirmation.element, lastName, std::string(),
+           "Token has delegation restriction, but no delegate id is present in the SubjectConfirmation");
+  } else if (confirmation.NameID && (!last || *confirmation.NameID != *last)) {
+    Refuse(sink, confirmation.NameID->element, lastName, confirmation.NameID->value,
+           "The SubjectConfirmation delegate id does not match the id of the last delegate");
+  }
+}
+
+void CheckAudience(const std::set<std::string> &audience, const VerifyOptions &options, const ElementNode *conditions,
+                   DeviationSink &sink) {
+  const std::set<std::string> &accepted = options.acceptedAudiences;
+  if (accepted.empty() || (audience.empty() && options.acceptUnrestrictedAudience)) {
+    return;
+  }
+  if (audience.empty()) {
+    Refuse(sink, conditions, JoinTexts(accepted), std::string(), "The token is not restricted to an audience");
+    return;
+  }
+  const bool isAccepted = std::any_of(audience.begin(), audience.end(),
+                                      [&accepted](const std::string &one) { return accepted.count(one) != 0; });
+  if (!isAccepted) {
+    const std::string found = JoinTexts(audience);
+    Refuse(sink, conditions, JoinTexts(accepted), found, "The token is restricted to other audiences: %1", found);
+  }
+}
+
+void CheckRequiredConfirmation(SamlToken::ConfirmationType confirmation, const VerifyOptions &options,
+                               const ElementNode *element, DeviationSink &sink) {
+  if (options.requiredConfirmation && confirmation != *options.requiredConfirmation) {
+    const char *const found = GetConfirmationName(confirmation);
+    const char *const wanted = GetConfirmationName(*options.requiredConfirmation);
+    Refuse(sink, {element, "Method"}, wanted, found, "The token's confirmation is %1, but %2 is required", found,
+           wanted);
+  }
+}
+
+const char *GetConfirmationName(SamlToken::ConfirmationType confirmation) noexcept {
+  return confirmation == SamlToken::HOLDER_OF_KEY ? "holder-of-key" : "bearer";
+}
+
+std::string JoinTexts(const std::set<std::string> &texts) {
+  std::string joined;
+  for (const std::string &text : texts) {
+    if (!joined.empty()) {
+      joined += ", ";
+    }
+    joined += text;
+  }
+  return joined;
 }
 
 } // namespace SsoClient

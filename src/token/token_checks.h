@@ -1,12 +1,23 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// `CheckTokenProperties`, the rules that a schema cannot express.
+/// The rules for a token that a schema cannot express: `CheckTokenProperties`, and what `VerifyOptions` demand.
+///
+/// Each rule reports to a sink. The sink of a verification throws at the first deviation. A function that takes a sink goes on
+/// after a deviation if the sink does.
 
 #pragma once
 
 #include "token/assertion_model.h"
+#include "xml/deviation_sink.h"
+
+#include <ssoclient/saml_token.h>
+#include <ssoclient/verify_options.h>
+#include <tarvel/system/date_time.h>
+#include <tarvel/xml/node.h>
 
 #include <cstdint>
+#include <set>
+#include <string>
 
 namespace SsoClient {
 
@@ -14,5 +25,30 @@ namespace SsoClient {
 /// @param clockToleranceSec seconds by which the time of validity is extended at both ends; a negative number shortens it
 /// @throws ParseException on the first rule that fails.
 void CheckTokenProperties(const SamlAssertionType &assertion, std::int64_t clockToleranceSec);
+
+/// The rules of `CheckTokenProperties`, in their order.
+void CheckVersion(const SamlAssertionType &assertion, DeviationSink &sink);
+void CheckId(const SamlAssertionType &assertion, DeviationSink &sink);
+/// Returns the time with which the validity was compared.
+Tarvel::System::DateTime CheckValidity(const ConditionsType &conditions, std::int64_t clockToleranceSec,
+                                       DeviationSink &sink);
+void CheckSubjectValidity(const SamlAssertionType &assertion, DeviationSink &sink);
+void CheckDelegation(const SamlAssertionType &assertion, DeviationSink &sink);
+
+/// Checks that a token with the audiences `audience`, none if it is not restricted, is for an accepted one.
+/// @param conditions the place that is reported; may be null
+void CheckAudience(const std::set<std::string> &audience, const VerifyOptions &options,
+                   const Tarvel::Xml::ElementNode *conditions, DeviationSink &sink);
+
+/// Checks that the confirmation is the required one, if one is required.
+/// @param element the place that is reported; may be null
+void CheckRequiredConfirmation(SamlToken::ConfirmationType confirmation, const VerifyOptions &options,
+                               const Tarvel::Xml::ElementNode *element, DeviationSink &sink);
+
+/// "bearer" or "holder-of-key".
+const char *GetConfirmationName(SamlToken::ConfirmationType confirmation) noexcept;
+
+/// `texts` in their order, separated by ", ".
+std::string JoinTexts(const std::set<std::string> &texts);
 
 } // namespace SsoClient

@@ -2,8 +2,8 @@
 
 #include "token/token_facts.h"
 
-#include <ssoclient/exceptions.h>
-#include <tarvel/core/message_formatter.h>
+#include "xml/refuse.h"
+
 #include <tarvel/core/string_util.h>
 
 #include <string_view>
@@ -12,8 +12,6 @@
 namespace SsoClient {
 
 namespace {
-
-using Tarvel::MessageFormatter;
 
 constexpr std::string_view GROUP_IDENTITY = SSOCLIENT_EXTENSION_AUTHORITY "/schemas/attr-names/2009/01/GroupIdentity";
 constexpr std::string_view IS_SOLUTION = SSOCLIENT_SOLUTION_AUTHORITY "/schemas/attr-names/2011/07/isSolution";
@@ -32,31 +30,22 @@ bool Allows(const boost::optional<Restriction> &restriction) {
   return restriction && restriction->Count && *restriction->Count != 0;
 }
 
-void TakeConditions(ConditionsType &conditions, TokenFacts &facts) {
-  facts.startDate = conditions.NotBefore;
-  facts.endDate = conditions.NotOnOrAfter;
-  facts.renewable = Allows(conditions.RenewRestriction);
-  facts.delegable = Allows(conditions.ProxyRestriction);
-  if (conditions.DelegationRestriction) {
-    for (const DelegateType &delegate : conditions.DelegationRestriction->delegates) {
-      facts.delegationChain.push_back(ParseToDelegate(delegate));
-    }
+void TakeGroups(AttributeType &attribute, TokenFacts &facts, DeviationSink &sink) {
+  if (facts.groups.empty()) { // reserving for each attribute would copy all groups each time
+    facts.groups.reserve(attribute.values.size());
   }
-  if (conditions.AudienceRestriction) {
-    facts.audience = std::move(conditions.AudienceRestriction->audiences);
+  for (std::string &value : attribute.values) {
+    if (!ParseGroupIdentity(std::move(value), facts.groups.emplace_back(), attribute.element, sink)) {
+      facts.groups.pop_back();
+    }
   }
 }
 
-void PopulateTokenAttribute(AttributeType &attribute, TokenFacts &facts) {
+void PopulateTokenAttribute(AttributeType &attribute, TokenFacts &facts, DeviationSink &sink) {
   if (SamlAttributeIsGroupIdentity(attribute)) {
-    if (facts.groups.empty()) { // reserving for each attribute would copy all groups each time
-      facts.groups.reserve(attribute.values.size());
-    }
-    for (std::string &value : attribute.values) {
-      facts.groups.push_back(ParseGroupIdentity(std::move(value)));
-    }
+    TakeGroups(attribute, facts, sink);
   } else if (SamlAttributeIsSolution(attribute)) {
-    facts.solution = ParseIsSolutionAttribute(attribute);
+    ParseIsSolutionAttribute(attribute, facts.solution, sink);
   } else if (SamlAttributeIsGivenName(attribute)) {
     facts.fullName.first = ParsePrincipalNameAttribute(attribute);
   } else if (SamlAttributeIsSurName(attribute)) {
@@ -68,20 +57,47 @@ void PopulateTokenAttribute(AttributeType &attribute, TokenFacts &facts) {
 
 TokenFacts TakeTokenFacts(SamlAssertionType &&assertion) {
   TokenFacts facts;
+  DeviationSink &sink = ThrowingSink();
+  TakeSubject(assertion, facts, sink);
+  TakeAttributes(assertion, facts, sink);
+  TakeConditions(assertion.Conditions, facts, sink);
+  return facts;
+}
+
+void TakeSubject(SamlAssertionType &assertion, TokenFacts &facts, DeviationSink &sink) {
   facts.id = std::move(assertion.ID);
-  facts.subject = ParseSamlNameId(assertion.Subject.NameID);
+  ParseSamlNameId(assertion.Subject.NameID, facts.subject, sink);
   facts.confirmationMethod = assertion.Subject.SubjectConfirmation.Method;
   facts.confirmationCertificate = std::move(assertion.Subject.SubjectConfirmation.SubjectConfirmationData.certificate);
+}
+
+void TakeAttributes(SamlAssertionType &assertion, TokenFacts &facts, DeviationSink &sink) {
   if (assertion.Advice) {
     facts.advice = std::move(assertion.Advice->advice);
   }
   if (assertion.AttributeStatement) {
     for (AttributeType &attribute : assertion.AttributeStatement->attributes) {
-      PopulateTokenAttribute(attribute, facts);
+      PopulateTokenAttribute(attribute, facts, sink);
     }
   }
-  TakeConditions(assertion.Conditions, facts);
-  return facts;
+}
+
+void TakeConditions(ConditionsType &conditions, TokenFacts &facts, DeviationSink &sink) {
+  facts.startDate = conditions.NotBefore;
+  facts.endDate = conditions.NotOnOrAfter;
+  facts.renewable = Allows(conditions.RenewRestriction);
+  facts.delegable = Allows(conditions.ProxyRestriction);
+  if (conditions.DelegationRestriction) {
+    for (const DelegateType &delegate : conditions.DelegationRestriction->delegates) {
+      Delegate parsed;
+      if (ParseToDelegate(delegate, parsed, sink)) {
+        facts.delegationChain.push_back(std::move(parsed));
+      }
+    }
+  }
+  if (conditions.AudienceRestriction) {
+    facts.audience = std::move(conditions.AudienceRestriction->audiences);
+  }
 }
 
 bool SamlAttributeIsGroupIdentity(const AttributeType &attribute) {
@@ -101,36 +117,62 @@ bool SamlAttributeIsSurName(const AttributeType &attribute) {
 }
 
 PrincipalId ParseGroupIdentity(std::string value) {
+  PrincipalId group;
+  ParseGroupIdentity(std::move(value), group, nullptr, ThrowingSink());
+  return group;
+}
+
+bool ParseGroupIdentity(std::string &&value, PrincipalId &group, const Tarvel::Xml::ElementNode *place,
+                        DeviationSink &sink) {
   const std::size_t backslash = value.find('\\');
   if (!HasBothSides(value, backslash)) {
-    throw ParseException(
-        MessageFormatter::ASPrint("Failed to parse Group Identity value: `%1'; domain or group missing", value));
+    Refuse(sink, place, "domain\\group", value, "Failed to parse Group Identity value: `%1'; domain or group missing",
+           value);
+    return false;
   }
-  std::string domain = value.substr(0, backslash);
+  group.domain.assign(value, 0, backslash);
   value.erase(0, backslash + 1);
-  return {std::move(value), std::move(domain)};
+  group.name = std::move(value);
+  return true;
 }
 
 PrincipalId ParseSamlNameId(const NameIDType &nameId) {
+  PrincipalId principal;
+  ParseSamlNameId(nameId, principal, ThrowingSink());
+  return principal;
+}
+
+bool ParseSamlNameId(const NameIDType &nameId, PrincipalId &principal, DeviationSink &sink) {
   if (nameId.Format != FORMAT_UPN) {
-    throw ParseException(MessageFormatter::ASPrint("Invalid or unsupported NameId format '%1'", nameId.Format));
+    Refuse(sink, {nameId.element, "Format"}, FORMAT_UPN, nameId.Format, "Invalid or unsupported NameId format '%1'",
+           nameId.Format);
+    return false;
   }
   const std::size_t atSign = nameId.value.rfind('@');
   if (!HasBothSides(nameId.value, atSign)) {
-    throw ParseException(MessageFormatter::ASPrint(
-        "Failed to parse the UPN NameID: `%1'; name or domain part is missing.", nameId.value));
+    Refuse(sink, nameId.element, "name@domain", nameId.value,
+           "Failed to parse the UPN NameID: `%1'; name or domain part is missing.", nameId.value);
+    return false;
   }
-  return {nameId.value.substr(0, atSign), nameId.value.substr(atSign + 1)};
+  principal = {nameId.value.substr(0, atSign), nameId.value.substr(atSign + 1)};
+  return true;
 }
 
 bool ParseIsSolutionAttribute(const AttributeType &attribute) {
-  if (attribute.values.empty()) {
-    throw ParseException("No value found for attribute isSolution.");
+  bool isSolution = false;
+  ParseIsSolutionAttribute(attribute, isSolution, ThrowingSink());
+  return isSolution;
+}
+
+bool ParseIsSolutionAttribute(const AttributeType &attribute, bool &isSolution, DeviationSink &sink) {
+  if (attribute.values.size() != 1) {
+    Refuse(sink, attribute.element, "one value", attribute.values.size(),
+           attribute.values.empty() ? "No value found for attribute isSolution."
+                                    : "More than one value found for attribute isSolution.");
+    return false;
   }
-  if (attribute.values.size() > 1) {
-    throw ParseException("More than one value found for attribute isSolution.");
-  }
-  return Tarvel::StringUtil::ToLower(attribute.values.front()) == "true";
+  isSolution = Tarvel::StringUtil::ToLower(attribute.values.front()) == "true";
+  return true;
 }
 
 std::string ParsePrincipalNameAttribute(const AttributeType &attribute) {
@@ -138,7 +180,14 @@ std::string ParsePrincipalNameAttribute(const AttributeType &attribute) {
 }
 
 Delegate ParseToDelegate(const DelegateType &delegate) {
-  return {ParseSamlNameId(delegate.NameID), delegate.DelegationInstant};
+  Delegate parsed;
+  ParseToDelegate(delegate, parsed, ThrowingSink());
+  return parsed;
+}
+
+bool ParseToDelegate(const DelegateType &delegate, Delegate &parsed, DeviationSink &sink) {
+  parsed.delegationInstant = delegate.DelegationInstant;
+  return ParseSamlNameId(delegate.NameID, parsed.subject, sink);
 }
 
 } // namespace SsoClient

@@ -5,6 +5,7 @@
 #pragma once
 
 #include "token/assertion_model.h"
+#include "xml/deviation_sink.h"
 
 #include <ssoclient/advice.h>
 #include <ssoclient/delegate.h>
@@ -13,6 +14,7 @@
 #include <tarvel/core/ref.h>
 #include <tarvel/crypto/certificate.h>
 #include <tarvel/system/date_time.h>
+#include <tarvel/xml/node.h>
 
 #include <set>
 #include <string>
@@ -43,6 +45,12 @@ struct TokenFacts {
 /// @throws ParseException when a name, a group or the solution attribute is malformed.
 TokenFacts TakeTokenFacts(SamlAssertionType &&assertion);
 
+/// The steps of `TakeTokenFacts`, in their order. What cannot be read is reported to `sink`, and left out if the sink does not
+/// throw. The parts of `assertion` that they read are moved from.
+void TakeSubject(SamlAssertionType &assertion, TokenFacts &facts, DeviationSink &sink);
+void TakeAttributes(SamlAssertionType &assertion, TokenFacts &facts, DeviationSink &sink);
+void TakeConditions(ConditionsType &conditions, TokenFacts &facts, DeviationSink &sink);
+
 /// The four kinds of attributes that are read; others are ignored. Each function checks the `Name` of `attribute`.
 bool SamlAttributeIsGroupIdentity(const AttributeType &attribute);
 bool SamlAttributeIsSolution(const AttributeType &attribute);
@@ -67,5 +75,14 @@ std::string ParsePrincipalNameAttribute(const AttributeType &attribute);
 /// The delegate and the time of the delegation.
 /// @throws ParseException in the same cases as `ParseSamlNameId`.
 Delegate ParseToDelegate(const DelegateType &delegate);
+
+/// The same functions for a sink that may not throw. They return whether the value could be read. If not, they report why and
+/// do not change the name or the flag.
+/// @param place where the group is; may be null
+bool ParseGroupIdentity(std::string &&value, PrincipalId &group, const Tarvel::Xml::ElementNode *place,
+                        DeviationSink &sink);
+bool ParseSamlNameId(const NameIDType &nameId, PrincipalId &principal, DeviationSink &sink);
+bool ParseIsSolutionAttribute(const AttributeType &attribute, bool &isSolution, DeviationSink &sink);
+bool ParseToDelegate(const DelegateType &delegate, Delegate &parsed, DeviationSink &sink);
 
 } // namespace SsoClient

@@ -2,10 +2,11 @@
 
 #include "token/token_signature.h"
 
+#include "xml/form_text.h"
+#include "xml/qualified_name.h"
+#include "xml/refuse.h"
 #include "xml/strict_checks.h"
 
-#include <ssoclient/exceptions.h>
-#include <tarvel/core/message_formatter.h>
 #include <tarvel/xml/security/exceptions.h>
 
 #include <algorithm>
@@ -21,14 +22,52 @@ using Tarvel::Ref;
 using Tarvel::Xml::ElementNode;
 using Tarvel::Xml::Security::Signature;
 
-Ref<Signature> ReadSignature(const ElementNode &root, const ElementNode &element) {
+constexpr ElementOfName EXPECTED{{Namespaces::DS, "Signature"}};
+
+/// The targets of the signature's references, as text on demand.
+struct UrisOf {
+  const Signature *signature;
+};
+
+std::string FormatMessageArgument(const UrisOf &uris) {
+  std::string text;
+  for (const Signature::Reference &reference : uris.signature->GetReferences()) {
+    text.append(text.empty() ? "" : ", ").append("\"").append(reference.uri).append("\"");
+  }
+  return text;
+}
+
+bool IsSignature(const NodeFilterIterator &iterator) {
+  return ElementQNameIs(IteratorToElement(iterator), EXPECTED.name.localName, EXPECTED.name.namespaceUri);
+}
+
+void RefuseMissingSignature(const NodeFilterIterator &iterator, DeviationSink &sink) {
+  Refuse(sink, iterator, EXPECTED, WhatIsAt{iterator.node}, "Expected element ds:Signature not found");
+}
+
+/// Null if the element is not a signature.
+Ref<Signature> ReadSignature(const ElementNode &root, const ElementNode &element, DeviationSink &sink) {
   Ref<Signature> signature;
   try {
     Tarvel::Xml::Security::CreateSignatureFromDom(root, element, signature);
   } catch (const Tarvel::Xml::Security::SignatureSyntaxException &error) {
-    throw ParseException(Tarvel::MessageFormatter::ASPrint("Signature syntax error: %1", error.what()));
+    Refuse(sink, element, EXPECTED, WhatIsAt{&element}, "Signature syntax error: %1", error.what());
+    return {};
   }
   return signature;
+}
+
+/// Moves the cursor from a node that was refused to the first signature after it, and refuses each node in between. Returns
+/// whether there is a signature. If not, the cursor does not move.
+bool MoveToSignature(NodeFilterIterator &iterator, DeviationSink &sink) {
+  NodeFilterIterator next = iterator;
+  while (next.node && !IsSignature(next)) {
+    next.MoveToSibling();
+  }
+  while (next.node && iterator.MoveToSibling().node != next.node) {
+    RefuseMissingSignature(iterator, sink);
+  }
+  return next.node;
 }
 
 // An identifier refers to one element only: the platform does not verify a document in which a second element has it.
@@ -42,14 +81,22 @@ bool CoversAssertion(const Signature &signature, std::string_view assertionId) {
 
 } // namespace
 
-void ParseTokenSignature(NodeFilterIterator &iterator, const ElementNode &assertion, Ref<Signature> &signature) {
-  const ElementNode *const element = IteratorToElement(iterator);
-  if (!element) {
-    throw ParseException("Expected element ds:Signature not found");
+void ParseTokenSignature(NodeFilterIterator &iterator, const ElementNode &assertion, Ref<Signature> &signature,
+                         DeviationSink &sink) {
+  if (const ElementNode *const element = IteratorToElement(iterator)) {
+    signature = ReadSignature(assertion, *element, sink);
+  } else {
+    RefuseMissingSignature(iterator, sink);
   }
-  signature = ReadSignature(assertion, *element);
-  if (!CoversAssertion(*signature, GetTextAttribute(assertion, "ID"))) {
-    throw ParseException("Token's signature must cover the entire token");
+  if (!IsSignature(iterator)) {
+    if (!MoveToSignature(iterator, sink)) {
+      return;
+    }
+    signature = ReadSignature(assertion, *IteratorToElement(iterator), sink);
+  }
+  if (signature && !CoversAssertion(*signature, GetTextAttribute(assertion, "ID"))) {
+    Refuse(sink, iterator, "a reference to the assertion's ID, or to the whole document", UrisOf{signature.get()},
+           TOKEN_NOT_COVERED);
   }
   iterator.MoveToSibling();
 }

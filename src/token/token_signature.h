@@ -4,18 +4,28 @@
 
 #pragma once
 
+#include "xml/deviation_sink.h"
 #include "xml/node_filter_iterator.h"
 
 #include <tarvel/core/ref.h>
 #include <tarvel/xml/node.h>
 #include <tarvel/xml/security/signature.h>
 
+#include <string_view>
+
 namespace SsoClient {
 
+/// The text with which a signature of anything else than the token is refused.
+constexpr std::string_view TOKEN_NOT_COVERED = "Token's signature must cover the entire token";
+
 /// Reads the signature at the cursor, a child of `assertion`, and moves the cursor to the next node. The signature is not
-/// verified yet, but one of its references is to `assertion` or to the whole document.
-/// @throws ParseException when there is no element, when it is not a signature, and when there is no such reference.
+/// verified yet, but one of its references must be to `assertion` or to the whole document.
+///
+/// It is reported if there is no element, if it is not a signature, and if there is no such reference. If the sink goes on
+/// and another node is at the cursor, the first `ds:Signature` after it is read; if there is none, the cursor does not move.
+/// `signature` stays null if none can be read.
 void ParseTokenSignature(NodeFilterIterator &iterator, const Tarvel::Xml::ElementNode &assertion,
-                         Tarvel::Ref<Tarvel::Xml::Security::Signature> &signature);
+                         Tarvel::Ref<Tarvel::Xml::Security::Signature> &signature,
+                         DeviationSink &sink = ThrowingSink());
 
 } // namespace SsoClient

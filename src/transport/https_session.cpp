@@ -37,12 +37,14 @@ HttpsSession::HttpsSession(const Ref<Tarvel::Http::ConnectionSpec> &spec, const 
 
 void HttpsSession::SendRequest(const Request &request, Ref<Reader> &response) {
   Ref<PendingRequestItem> pending;
-  SendRequestAsync(request, noop, pending);
+  // The facts are read on this thread: after a time-out, the I/O thread must not write them any more.
+  Start(request, noop, nullptr, pending);
   std::shared_ptr<const Exception> error;
   Ref<Reader> body;
   try {
     Ref<ClientResponse> received;
     m_userAgent->WaitForRequest(pending, m_timeoutMicroseconds, received);
+    ReadFacts(received, request.facts.get());
     TranslateResponse(nullptr, received, error, body);
   } catch (const Exception &exception) {
     TranslateResponse(&exception, nullptr, error, body);
@@ -61,6 +63,11 @@ void HttpsSession::SendRequestAsync(const Request &request, const Completion &co
 
 void HttpsSession::SendRequestAsync(const Request &request, const Completion &completion,
                                     Ref<PendingRequestItem> &pending) {
+  Start(request, completion, request.facts, pending);
+}
+
+void HttpsSession::Start(const Request &request, const Completion &completion,
+                         const std::shared_ptr<ResponseFacts> &facts, Ref<PendingRequestItem> &pending) {
   Ref<ClientRequest> message;
   Tarvel::Http::CreateHttpRequest("POST", m_path, message);
   message->SetHeader("Content-Type", "text/xml");
@@ -68,8 +75,9 @@ void HttpsSession::SendRequestAsync(const Request &request, const Completion &co
   message->WriteBody(request.body);
   m_userAgent->StartRequest(
       message,
-      [completion](const Exception *exception, const Ref<ClientResponse> &response,
-                   const Ref<PendingRequestItem> &item) {
+      [completion, facts](const Exception *exception, const Ref<ClientResponse> &response,
+                          const Ref<PendingRequestItem> &item) {
+        ReadFacts(response, facts.get());
         AsyncTranslateResponse(completion, exception, response, item);
       },
       pending);
@@ -88,6 +96,20 @@ void TranslateResponse(const Exception *exception, const Ref<ClientResponse> &re
   }
   error = std::make_shared<CommunicationException>("Server returned error: " + std::to_string(status) + " " +
                                                    response->GetReasonPhrase());
+}
+
+void ReadFacts(const Ref<ClientResponse> &response, ResponseFacts *facts) noexcept {
+  if (!response || !facts) {
+    return;
+  }
+  facts->status = response->GetStatusCode();
+  facts->octets = response->GetBodyLength();
+  try {
+    facts->reason = response->GetReasonPhrase();
+    response->GetHeader("Content-Type", facts->contentType);
+  } catch (const std::bad_alloc &) {
+    // Without memory the texts are missing, but the response is not lost. NOLINT(bugprone-empty-catch)
+  }
 }
 
 void AsyncTranslateResponse(const TransportSession::Completion &completion, const Exception *exception,

@@ -18,8 +18,8 @@
 
 namespace SsoClient {
 
-/// Posts requests with its own cookie store: a cookie that the service sets in one leg of a negotiation is sent in the next
-/// leg, and in no other session.
+/// Posts requests with its own cookie store: a cookie that the service sets in one leg of a negotiation is sent in the
+/// next leg, and in no other session.
 class HttpsSession final : public TransportSession {
 public:
   HttpsSession(const Tarvel::Ref<Tarvel::Http::ConnectionSpec> &spec, const std::string &path,
@@ -36,6 +36,10 @@ public:
                         Tarvel::Ref<Tarvel::Http::PendingRequestItem> &pending);
 
 private:
+  /// Posts the request. `facts` is written on the I/O thread, before the completion; null for none.
+  void Start(const Request &request, const Completion &completion, const std::shared_ptr<ResponseFacts> &facts,
+             Tarvel::Ref<Tarvel::Http::PendingRequestItem> &pending);
+
   Tarvel::Ref<Tarvel::Http::UserAgent> m_userAgent;
   const std::string m_path;
   const std::int64_t m_timeoutMicroseconds;
@@ -47,6 +51,9 @@ private:
 /// @param error set to a `CommunicationException`
 void TranslateResponse(const Tarvel::Exception *exception, const Tarvel::Ref<Tarvel::Http::ClientResponse> &response,
                        std::shared_ptr<const Tarvel::Exception> &error, Tarvel::Ref<Tarvel::Reader> &body);
+
+/// Sets `facts` to those of `response`; does nothing if either is null.
+void ReadFacts(const Tarvel::Ref<Tarvel::Http::ClientResponse> &response, ResponseFacts *facts) noexcept;
 
 /// Calls `completion` once, with the error and null or with null and the body of the response. The error is a
 /// `Tarvel::OutOfMemoryException` when memory runs out here. `pending` is not used; the user agent passes it.

@@ -21,8 +21,8 @@ class ScheduledItem;
 
 namespace SsoClient {
 
-/// One conversation with the service. All legs of a negotiation are sent in one session; every other request has its own. A
-/// session is for one operation at a time.
+/// One conversation with the service. All legs of a negotiation are sent in one session; every other request has its
+/// own. A session is for one operation at a time.
 class TransportSession {
 public:
   /// Called once: with null and a reader over the response body, or with the failure and null. Both pointers are valid
@@ -30,11 +30,14 @@ public:
   using Completion = std::function<void(const Tarvel::Exception *failure, Tarvel::Reader *response)>;
 
   /// Posts the request and waits for the whole response. `response` can still be read after the session is destroyed.
+  /// If the request has a place for the facts of the response, they are there also when an HTTP status is thrown as an
+  /// exception.
   /// @throws CommunicationException when the transport fails.
   virtual void SendRequest(const Request &request, Tarvel::Ref<Tarvel::Reader> &response) = 0;
 
-  /// Posts the request without waiting; `item` cancels it. `completion` runs on an I/O thread, where it must neither block nor
-  /// wait for another request. The product itself calls only `SendRequest`.
+  /// Posts the request without waiting; `item` cancels it. `completion` runs on an I/O thread, where it must neither
+  /// block nor wait for another request. The facts of the response are written there before. The product itself calls
+  /// only `SendRequest`.
   virtual void SendRequestAsync(const Request &request, const Completion &completion,
                                 Tarvel::Ref<Tarvel::System::ScheduledItem> &item) = 0;
 

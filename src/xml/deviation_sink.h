@@ -9,6 +9,7 @@
 
 #include <tarvel/xml/node.h>
 
+#include <cstdint>
 #include <string>
 
 namespace SsoClient {
@@ -20,6 +21,7 @@ struct Deviation {
   std::string attribute;                             ///< the name of an attribute; empty if it is about the element
   std::string allowed;                               ///< what the form allows or expects there; may be empty
   std::string found;                                 ///< what is there; may be empty
+  std::int64_t missedBySec = 0; ///< of a time: by how many seconds this machine's clock misses it, after the tolerance
 };
 
 /// Receives deviations in the order in which the rules meet them. For one thread.
@@ -44,5 +46,16 @@ protected:
 
 /// The sink of verifications, which throws at the first deviation. It has no state, so all threads may use it.
 DeviationSink &ThrowingSink() noexcept;
+
+/// Reports the deviation that `make` returns. `make` is called only if `sink` keeps the deviation, so that a document with a
+/// million deviations costs no texts.
+template <typename Make>
+void ReportDeviation(DeviationSink &sink, const Make &make) {
+  if (sink.IsFull()) {
+    sink.Count();
+  } else {
+    sink.Add(make());
+  }
+}
 
 } // namespace SsoClient

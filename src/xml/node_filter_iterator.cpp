@@ -28,7 +28,7 @@ bool SkipWsAndCommentsFilter::Accept(const Node &node) const {
 }
 
 NodeFilterIterator::NodeFilterIterator(const Node *startNode, std::shared_ptr<const NodeFilter> nodeFilter)
-    : node(startNode), filter(std::move(nodeFilter)) {}
+    : node(startNode), filter(std::move(nodeFilter)), parent(startNode ? startNode->GetParent() : nullptr) {}
 
 NodeFilterIterator &NodeFilterIterator::MoveToSibling() {
   while (node) {
@@ -41,6 +41,7 @@ NodeFilterIterator &NodeFilterIterator::MoveToSibling() {
 }
 
 NodeFilterIterator &NodeFilterIterator::MoveToChild() {
+  parent = node;
   node = node ? node->GetFirstChild() : nullptr;
   if (node && !filter->Accept(*node)) {
     MoveToSibling();
@@ -52,10 +53,6 @@ NodeFilterIterator NodeFilterIterator::GetChild() const {
   NodeFilterIterator child = *this;
   child.MoveToChild();
   return child;
-}
-
-const Tarvel::Xml::ElementNode *IteratorToElement(const NodeFilterIterator &iterator) noexcept {
-  return Tarvel::Xml::AsElement(iterator.node);
 }
 
 } // namespace SsoClient

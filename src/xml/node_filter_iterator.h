@@ -50,9 +50,13 @@ public:
 
   const Tarvel::Xml::Node *node; ///< the node at the cursor; null past the end
   std::shared_ptr<const NodeFilter> filter;
+  const Tarvel::Xml::Node
+      *parent; ///< the parent of the nodes over which the cursor moves, also past their end; may be null
 };
 
 /// The element at the cursor; null past the end and at a node of another kind.
-const Tarvel::Xml::ElementNode *IteratorToElement(const NodeFilterIterator &iterator) noexcept;
+inline const Tarvel::Xml::ElementNode *IteratorToElement(const NodeFilterIterator &iterator) noexcept {
+  return Tarvel::Xml::AsElement(iterator.node);
+}
 
 } // namespace SsoClient

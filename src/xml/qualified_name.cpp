@@ -2,8 +2,7 @@
 
 #include "xml/qualified_name.h"
 
-#include <ssoclient/exceptions.h>
-#include <tarvel/core/message_formatter.h>
+#include "xml/refuse.h"
 
 #include <string>
 
@@ -25,20 +24,29 @@ std::string QNameView::ToString() const {
   return ToQName(*this).ToString();
 }
 
+std::string FormatMessageArgument(const QNameView &name) {
+  return name.ToString();
+}
+
 QNameView ResolveQName(const ElementNode &element, std::string_view text, std::string_view defaultNamespace) {
+  return ResolveQName(element, std::string_view(), text, defaultNamespace, ThrowingSink()).value();
+}
+
+std::optional<QNameView> ResolveQName(const ElementNode &element, std::string_view attributeName, std::string_view text,
+                                      std::string_view defaultNamespace, DeviationSink &sink) {
   const std::size_t colon = text.find(':');
   if (colon == std::string_view::npos) {
-    return {defaultNamespace, text};
+    return QNameView(defaultNamespace, text);
   }
   const std::string_view prefix = text.substr(0, colon);
   std::string_view namespaceUri;
   if (!element.LookupNamespace(prefix, namespaceUri)) {
     // The missing blank and the two different quotes are part of the established form of the message.
-    throw ParseException(Tarvel::MessageFormatter::ASPrint("Element %1at %2,%3 uses undefined prefix: `%4'",
-                                                           element.GetName(), element.GetLine(), element.GetColumn(),
-                                                           prefix));
+    Refuse(sink, {element, attributeName}, "a declared prefix", text, "Element %1at %2,%3 uses undefined prefix: `%4'",
+           element.GetName(), element.GetLine(), element.GetColumn(), prefix);
+    return std::nullopt;
   }
-  return {namespaceUri, text.substr(colon + 1)};
+  return QNameView(namespaceUri, text.substr(colon + 1));
 }
 
 void ResolveQName(const ElementNode &element, std::string_view text, std::string_view defaultNamespace, QName &name) {
@@ -49,15 +57,15 @@ bool ElementQNameIs(const ElementNode *element, std::string_view localName, std:
   return element && element->HasQName(namespaceUri, localName);
 }
 
-bool ElementXsiTypeIs(const ElementNode &element, const QNameView &type) {
-  const Attribute *const attribute = element.FindAttribute(Namespaces::XSI, "type");
-  return attribute && ResolveXsiType(element, attribute->GetValue()) == type;
+bool ElementXsiTypeIs(const ElementNode &element, const QNameView &type, DeviationSink &sink) {
+  const Attribute *const attribute = element.FindAttribute(XSI_TYPE.namespaceUri, XSI_TYPE.localName);
+  return attribute && ResolveXsiType(element, *attribute, sink) == type;
 }
 
-QNameView ResolveXsiType(const ElementNode &element, std::string_view text) {
+std::optional<QNameView> ResolveXsiType(const ElementNode &element, const Attribute &attribute, DeviationSink &sink) {
   std::string_view defaultNamespace;
   element.LookupNamespace(std::string_view(), defaultNamespace);
-  return ResolveQName(element, text, defaultNamespace);
+  return ResolveQName(element, attribute.GetName(), attribute.GetValue(), defaultNamespace, sink);
 }
 
 } // namespace SsoClient

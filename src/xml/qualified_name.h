@@ -5,10 +5,12 @@
 #pragma once
 
 #include "model/namespaces.h"
+#include "xml/deviation_sink.h"
 
 #include <tarvel/xml/node.h>
 #include <tarvel/xml/qname.h>
 
+#include <optional>
 #include <string>
 #include <string_view>
 
@@ -28,6 +30,9 @@ struct QNameView {
   std::string ToString() const;
 };
 
+/// For `Tarvel::MessageFormatter`.
+std::string FormatMessageArgument(const QNameView &name);
+
 /// `name` in no namespace: the name of an attribute without a prefix.
 constexpr QNameView LocalName(std::string_view name) noexcept {
   return {std::string_view(), name};
@@ -43,6 +48,12 @@ constexpr QNameView XSI_TYPE(Namespaces::XSI, "type");
 QNameView ResolveQName(const Tarvel::Xml::ElementNode &element, std::string_view text,
                        std::string_view defaultNamespace);
 
+/// The same for the name or the value of an attribute of `element`. A prefix that is not bound is reported to `sink`.
+/// @param attributeName the place that is reported.
+/// @return nothing if the prefix is not bound.
+std::optional<QNameView> ResolveQName(const Tarvel::Xml::ElementNode &element, std::string_view attributeName,
+                                      std::string_view text, std::string_view defaultNamespace, DeviationSink &sink);
+
 /// The same, but the result owns its texts.
 /// @param name set on success only.
 void ResolveQName(const Tarvel::Xml::ElementNode &element, std::string_view text, std::string_view defaultNamespace,
@@ -53,13 +64,15 @@ void ResolveQName(const Tarvel::Xml::ElementNode &element, std::string_view text
 bool ElementQNameIs(const Tarvel::Xml::ElementNode *element, std::string_view localName,
                     std::string_view namespaceUri) noexcept;
 
-/// Whether `element` has an `xsi:type` whose value is `type`. A value without a prefix is in the default namespace.
-/// @throws ParseException when the type's prefix is not bound.
-bool ElementXsiTypeIs(const Tarvel::Xml::ElementNode &element, const QNameView &type);
+/// Whether `element` has an `xsi:type` whose value is `type`. A value without a prefix is in the default namespace. If the
+/// type's prefix is not bound, that is reported, and the answer is no.
+bool ElementXsiTypeIs(const Tarvel::Xml::ElementNode &element, const QNameView &type,
+                      DeviationSink &sink = ThrowingSink());
 
-/// Reads `text`, the value of an `xsi:type` of `element`, as a name. A name without a prefix is in the default namespace.
-/// @return a view into `text` and into the tree.
-/// @throws ParseException when the prefix is not bound.
-QNameView ResolveXsiType(const Tarvel::Xml::ElementNode &element, std::string_view text);
+/// Reads the value of `attribute`, an `xsi:type` of `element`, as a name. A name without a prefix is in the default
+/// namespace. A prefix that is not bound is reported.
+/// @return a view into the tree, or nothing if the prefix is not bound.
+std::optional<QNameView> ResolveXsiType(const Tarvel::Xml::ElementNode &element,
+                                        const Tarvel::Xml::Attribute &attribute, DeviationSink &sink);
 
 } // namespace SsoClient

@@ -2,14 +2,15 @@
 
 #include "xml/strict_checks.h"
 
-#include <ssoclient/exceptions.h>
-#include <tarvel/core/exception.h>
-#include <tarvel/core/message_formatter.h>
+#include "xml/form_text.h"
+#include "xml/refuse.h"
+
 #include <tarvel/core/string_util.h>
 
 #include <boost/lexical_cast.hpp>
 
 #include <algorithm>
+#include <optional>
 
 namespace SsoClient {
 
@@ -22,18 +23,22 @@ constexpr std::string_view DEFAULT_DECLARATION = "xmlns";
 constexpr std::string_view PREFIX_DECLARATION = "xmlns:";
 constexpr std::string_view DIGITS = "0123456789";
 
-template <typename... Args>
-[[noreturn]] void Refuse(std::string_view format, const Args &...args) {
-  throw ParseException(Tarvel::MessageFormatter::ASPrint(format, args...));
-}
-
-[[noreturn]] void RefuseMissingAttribute(const ElementNode &element, std::string_view name) {
+template <typename Name>
+void RefuseMissingAttribute(DeviationSink &sink, const ElementNode &element, const Place &place,
+                            const AttributesOfNames<Name> &allowed, const Name &name) {
   // The missing apostrophe after the name of the element is part of the established form of the message.
-  Refuse("Node '%1 is missing required attribute '%2'", element.GetName(), name);
+  Refuse(sink, place, allowed, "", "Node '%1 is missing required attribute '%2'", element.GetName(), name);
 }
 
 std::string_view NameOf(const ElementNode *element) {
   return element ? element->GetName() : std::string_view();
+}
+
+/// The element's name for each prefix; without a namespace if its prefix is not bound.
+QNameView QNameOf(const ElementNode &element) {
+  std::string_view namespaceUri;
+  element.LookupNamespace(element.GetPrefix(), namespaceUri);
+  return {namespaceUri, element.GetLocalName()};
 }
 
 bool IsDeclaration(std::string_view attributeName) {
@@ -44,6 +49,14 @@ bool IsDeclaration(std::string_view attributeName) {
 template <typename Names, typename Name>
 bool Contains(const Names &names, const Name &name) {
   return std::find(names.begin(), names.end(), name) != names.end();
+}
+
+void ReadDate(const ElementNode &element, std::string_view name, std::string_view text, Tarvel::System::DateTime &date,
+              DeviationSink &sink) {
+  if (!Tarvel::System::DateTime::TryParse(text, date)) {
+    Refuse(sink, {element, name}, "a date of the form xsd:dateTime", text, "%1/@%2 is not a date", element.GetName(),
+           name);
+  }
 }
 
 bool HasAttributeWritten(const ElementNode &element, std::string_view name) {
@@ -59,72 +72,97 @@ bool HasAttributeWritten(const ElementNode &element, std::string_view name) {
 
 const ElementNode &RequireElementQName(const ElementNode *element, std::string_view localName,
                                        std::string_view namespaceUri) {
+  RequireElementQName(NodeFilterIterator(element, nullptr), localName, namespaceUri, ThrowingSink());
+  return *element;
+}
+
+bool RequireElementQName(const NodeFilterIterator &iterator, std::string_view localName, std::string_view namespaceUri,
+                         DeviationSink &sink) {
+  const ElementNode *const element = IteratorToElement(iterator);
   if (ElementQNameIs(element, localName, namespaceUri)) {
-    return *element;
+    return true;
   }
-  if (!element || element->GetLocalName() != localName) {
-    Refuse("Expected element '%1' not found.", localName);
+  const ElementOfName allowed{{namespaceUri, localName}};
+  if (element && element->GetLocalName() == localName) {
+    Refuse(sink, *element, allowed, ElementOfName{QNameOf(*element)}, "Element '%1' has unexpected namespace",
+           element->GetName());
+  } else {
+    Refuse(sink, iterator, allowed, WhatIsAt{iterator.node}, "Expected element '%1' not found.", localName);
   }
-  Refuse("Element '%1' has unexpected namespace", element->GetName());
+  return false;
 }
 
-void RequireEmptyElement(NodeFilterIterator iterator) {
-  if (iterator.GetChild().node) {
-    Refuse("Element '%1' must be empty", NameOf(IteratorToElement(iterator)));
+void RequireEmptyElement(NodeFilterIterator iterator, DeviationSink &sink) {
+  if (const Tarvel::Xml::Node *const content = iterator.GetChild().node) {
+    Refuse(sink, iterator, "no content", WhatIsAt{content}, "Element '%1' must be empty",
+           NameOf(IteratorToElement(iterator)));
   }
 }
 
-void RequireNoFurtherNode(const NodeFilterIterator &iterator, const char *message) {
-  if (iterator.node) {
-    throw ParseException(message);
+void RequireNoFurtherNode(NodeFilterIterator iterator, const char *message, DeviationSink &sink) {
+  for (; iterator.node; iterator.MoveToSibling()) {
+    RefuseFurtherNode(iterator, message, sink);
   }
 }
 
-void RequireNoAttributes(const ElementNode &element) {
-  RequireElementAttributesNames(element, {}, {});
+void RefuseFurtherNode(const NodeFilterIterator &iterator, const char *message, DeviationSink &sink) {
+  Refuse(sink, iterator, "no further element", WhatIsAt{iterator.node}, "%1", message);
+}
+
+void RequireNoAttributes(const ElementNode &element, DeviationSink &sink) {
+  RequireElementAttributesNames(element, {}, {}, sink);
 }
 
 void RequireElementAttributesNames(const ElementNode &element, std::initializer_list<std::string_view> required,
-                                   std::initializer_list<std::string_view> optional) {
+                                   std::initializer_list<std::string_view> optional, DeviationSink &sink) {
+  const AttributesOfNames<std::string_view> allowed{required, optional};
   // There are few known names, so a scan for each of them is faster than a set, and linear in the number of attributes.
   for (const std::string_view name : required) {
     if (!HasAttributeWritten(element, name)) {
-      RefuseMissingAttribute(element, name);
+      RefuseMissingAttribute(sink, element, {element, name}, allowed, name);
     }
   }
   for (const Attribute *attribute = element.GetFirstAttribute(); attribute; attribute = attribute->GetNext()) {
     const std::string_view name = attribute->GetName();
     if (!Contains(required, name) && !Contains(optional, name) && !IsDeclaration(name)) {
-      Refuse("Unexpected attributes on element '%1'", element.GetName());
+      Refuse(sink, {element, name}, allowed, attribute->GetValue(), "Unexpected attributes on element '%1'",
+             element.GetName());
     }
   }
 }
 
 void RequireElementAttributesQNames(const ElementNode &element, std::initializer_list<QNameView> required,
-                                    std::initializer_list<QNameView> optional) {
+                                    std::initializer_list<QNameView> optional, DeviationSink &sink) {
+  const AttributesOfNames<QNameView> allowed{required, optional};
   for (const Attribute *attribute = element.GetFirstAttribute(); attribute; attribute = attribute->GetNext()) {
-    if (IsDeclaration(attribute->GetName())) {
+    const std::string_view written = attribute->GetName();
+    if (IsDeclaration(written)) {
       continue;
     }
-    const QNameView name = ResolveQName(element, attribute->GetName(), std::string_view());
-    if (!Contains(required, name) && !Contains(optional, name)) {
-      Refuse("Unexpected attribute '%1' on element '%2'", name.ToString(), element.GetName());
+    const std::optional<QNameView> name = ResolveQName(element, written, written, std::string_view(), sink);
+    if (name && !Contains(required, *name) && !Contains(optional, *name)) {
+      Refuse(sink, {element, written}, allowed, attribute->GetValue(), "Unexpected attribute '%1' on element '%2'",
+             *name, element.GetName());
     }
   }
   for (const QNameView &name : required) {
     if (!element.FindAttribute(name.namespaceUri, name.localName)) {
-      RefuseMissingAttribute(element, name.ToString());
+      RefuseMissingAttribute(sink, element, {element, name.localName}, allowed, name);
     }
   }
 }
 
-void RequireTextualContent(NodeFilterIterator iterator, std::string &text) {
+bool RequireTextualContent(const NodeFilterIterator &iterator, std::string &text, DeviationSink &sink) {
   const ElementNode *const element = IteratorToElement(iterator);
-  const Tarvel::Xml::TextNode *const textNode = Tarvel::Xml::AsText(iterator.MoveToChild().node);
-  if (!textNode || iterator.MoveToSibling().node) {
-    Refuse("Element '%1' must only have textual content (but has extra children or is empty).", NameOf(element));
+  NodeFilterIterator content = iterator.GetChild();
+  const Tarvel::Xml::TextNode *const textNode = Tarvel::Xml::AsText(content.node);
+  if (!textNode || content.MoveToSibling().node) {
+    Refuse(sink, iterator, "one text", WhatIsAt{content.node},
+           "Element '%1' must only have textual content (but has extra children or is empty).", NameOf(element));
+    return false;
   }
   text = textNode->GetValue();
+  return true;
 }
 
 std::string_view GetTextAttribute(const ElementNode &element, std::string_view name) noexcept {
@@ -133,24 +171,29 @@ std::string_view GetTextAttribute(const ElementNode &element, std::string_view n
 }
 
 void GetDateAttribute(const ElementNode &element, std::string_view name, Tarvel::System::DateTime &date) {
-  try {
-    date = Tarvel::System::DateTime(GetTextAttribute(element, name));
-  } catch (const Tarvel::DateTimeFormatException &) {
-    Refuse("%1/@%2 is not a date", element.GetName(), name);
+  ReadDate(element, name, GetTextAttribute(element, name), date, ThrowingSink());
+}
+
+void GetDateAttribute(const ElementNode &element, std::string_view name, Tarvel::System::DateTime &date,
+                      DeviationSink &sink) {
+  if (const Attribute *const attribute = element.FindAttribute(std::string_view(), name)) {
+    ReadDate(element, name, attribute->GetValue(), date, sink);
   }
 }
 
-void GetBoolAttribute(const ElementNode &element, std::string_view name, bool &flag) {
-  const std::string text = Tarvel::StringUtil::ToLower(GetTextAttribute(element, name));
+void GetBoolAttribute(const ElementNode &element, std::string_view name, bool &flag, DeviationSink &sink) {
+  const std::string_view written = GetTextAttribute(element, name);
+  const std::string text = Tarvel::StringUtil::ToLower(written);
   const bool isTrue = text == "1" || text == "true";
   if (!isTrue && text != "0" && text != "false") {
-    Refuse("%1/@%2 is not a Boolean", element.GetName(), name);
+    Refuse(sink, {element, name}, "true, 1, false or 0", written, "%1/@%2 is not a Boolean", element.GetName(), name);
+    return;
   }
   flag = isTrue;
 }
 
 void GetULongOptionalAttribute(const ElementNode &element, std::string_view name,
-                               boost::optional<std::uint64_t> &number) {
+                               boost::optional<std::uint64_t> &number, DeviationSink &sink) {
   const Attribute *const attribute = element.FindAttribute(std::string_view(), name);
   if (!attribute) {
     number = boost::none;
@@ -161,7 +204,9 @@ void GetULongOptionalAttribute(const ElementNode &element, std::string_view name
   // Signs and digit grouping are refused first: the conversion would read "-1" as a number near 2^64.
   if (text.find_first_not_of(DIGITS) != std::string_view::npos ||
       !boost::conversion::try_lexical_convert(text.data(), text.size(), value)) {
-    Refuse("%1/@%2 is not a non-negative integer.", element.GetName(), name);
+    Refuse(sink, {element, name}, "a non-negative integer", text, "%1/@%2 is not a non-negative integer.",
+           element.GetName(), name);
+    return;
   }
   number = value;
 }

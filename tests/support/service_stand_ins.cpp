@@ -99,7 +99,11 @@ public:
       const std::lock_guard<std::mutex> lock(m_state->mutex);
       m_state->sent.push_back(std::to_string(m_number) + ": " + request.body);
     }
-    response = Tarvel::CreateStringReader(m_state->answer(request));
+    const std::string answer = m_state->answer(request);
+    if (request.facts) {
+      *request.facts = {200, "OK", "text/xml", answer.size()};
+    }
+    response = Tarvel::CreateStringReader(answer);
   }
 
   void SendRequestAsync(const SsoClient::Request &, const Completion &,

@@ -2,6 +2,8 @@
 
 #include "delivery.h"
 
+#include "time_text.h"
+
 #include <algorithm>
 
 namespace DevSts {
@@ -39,8 +41,8 @@ const char *ReasonPhrase(int status) {
 
 std::string Head(const HttpAnswer &answer, const std::string &contentLength, bool keepOpen) {
   return "HTTP/1.1 " + std::to_string(answer.status) + " " + ReasonPhrase(answer.status) +
-         "\r\nContent-Type: " + answer.contentType + "\r\nContent-Length: " + contentLength +
-         "\r\nConnection: " + (keepOpen ? "keep-alive" : "close") + "\r\n\r\n";
+         "\r\nDate: " + HttpTimeText(Now()) + "\r\nContent-Type: " + answer.contentType +
+         "\r\nContent-Length: " + contentLength + "\r\nConnection: " + (keepOpen ? "keep-alive" : "close") + "\r\n\r\n";
 }
 
 Delivery Single(std::string bytes, DeliveryEnd end) {

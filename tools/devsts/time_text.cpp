@@ -60,6 +60,21 @@ std::string TimeText(Time time) {
   return text.data();
 }
 
+std::string HttpTimeText(Time time) {
+  constexpr std::array<const char *, 7> DAYS{"Sun", "Mon", "Tue", "Wed", "Thu", "Fri", "Sat"};
+  constexpr std::array<const char *, 12> MONTHS{"Jan", "Feb", "Mar", "Apr", "May", "Jun",
+                                                "Jul", "Aug", "Sep", "Oct", "Nov", "Dec"};
+  const auto day = floor<days>(time);
+  const year_month_day date(day);
+  const hh_mm_ss<milliseconds> clock(time - day);
+  std::array<char, 64> text{};
+  std::snprintf(text.data(), text.size(), "%s, %02u %s %04d %02d:%02d:%02d GMT", DAYS[weekday(day).c_encoding()],
+                static_cast<unsigned>(date.day()), MONTHS[static_cast<unsigned>(date.month()) - 1],
+                static_cast<int>(date.year()), static_cast<int>(clock.hours().count()),
+                static_cast<int>(clock.minutes().count()), static_cast<int>(clock.seconds().count()));
+  return text.data();
+}
+
 std::optional<Time> ParseTime(std::string_view text) {
   if (text.size() <= FORM.size() || text.back() != 'Z' || !HasForm(text)) {
     return std::nullopt;

@@ -6,6 +6,8 @@
 #include "connection.h"
 #include "credentials.h"
 #include "identity.h"
+#include "operation_events.h"
+#include "refused_token.h"
 #include "token_output.h"
 #include "token_spec_options.h"
 #include "trust.h"
@@ -36,10 +38,15 @@ ExitCode Acquire(const AcquireOptions &options, const OutputOptions &output) {
   CheckTokenOutput(options.tokenOutput, output);
 
   const Tarvel::Crypto::CertificateList trusted = LoadTrusted(options.trust, output);
-  const auto service = CreateService(options.connection, trusted, LoadIdentity(options.identity));
-  const IssuedToken issued = kind.acquire({*service, spec, hasIdentity, options.credentials, options.connection.url,
-                                           trusted, options.trust.toleranceSec, output});
-  RequireWithinTolerance(*issued.token, trusted, options.trust.toleranceSec);
+  RefusedToken refused(options.tokenOutput, output);
+  const auto service = CreateService(options.connection, trusted, LoadIdentity(options.identity),
+                                     {{}, ObserverFor(output), refused.GetSink()});
+  const IssuedToken issued = refused.Explain([&] {
+    IssuedToken acquired = kind.acquire({*service, spec, hasIdentity, options.credentials, options.connection.url,
+                                         trusted, options.trust.toleranceSec, output});
+    RequireWithinTolerance(*acquired.token, trusted, options.trust.toleranceSec, refused.GetSink());
+    return acquired;
+  });
   WriteToken(issued, spec, options.trust.toleranceSec, options.tokenOutput, output);
   return ExitCode::DONE;
 }

@@ -32,5 +32,6 @@ Action DefineRenew(CLI::App &app, const OutputOptions &output);
 Action DefineValidate(CLI::App &app, const OutputOptions &output);
 Action DefineVerify(CLI::App &app, const OutputOptions &output);
 Action DefineInspect(CLI::App &app, const OutputOptions &output);
+Action DefineDoctor(CLI::App &app, const OutputOptions &output);
 
 } // namespace SsoClient::Tool

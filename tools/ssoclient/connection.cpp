@@ -6,9 +6,7 @@
 #include "option.h"
 
 #include <ssoclient/security_token_service_config.h>
-#include <tarvel/core/ref.h>
 #include <tarvel/http/url.h>
-#include <tarvel/ssl/ssl_context.h>
 
 #include <cstddef>
 
@@ -84,25 +82,31 @@ void CheckConnection(const ConnectionOptions &options) {
   }
 }
 
+Tarvel::Ref<Tarvel::Ssl::SSLContext> CreateContext(const ConnectionOptions &options) {
+  if (!IsSecure(options.url)) {
+    return nullptr;
+  }
+  const Tarvel::Ref<Tarvel::Ssl::SSLContext> context = Tarvel::Ssl::CreateSSLContext();
+  if (!options.caFile.empty()) {
+    context->TrustFile(options.caFile);
+  } else if (options.thumbprint.empty()) {
+    context->TrustSystemStore();
+  }
+  return context;
+}
+
 std::shared_ptr<SecurityTokenService> CreateService(const ConnectionOptions &options,
                                                     const Tarvel::Crypto::CertificateList &trusted,
-                                                    const boost::optional<HolderOfKeyConfig> &identity) {
+                                                    const boost::optional<HolderOfKeyConfig> &identity,
+                                                    const ServiceOptions &serviceOptions) {
   SecurityTokenServiceConfig config;
   config.stsUrl = options.url;
   config.signingCertificates = trusted;
   config.sslParameter = options.thumbprint;
   config.holderOfKeyConfig = identity;
-  Tarvel::Ref<Tarvel::Ssl::SSLContext> context;
-  if (IsSecure(options.url)) {
-    context = Tarvel::Ssl::CreateSSLContext();
-    if (!options.caFile.empty()) {
-      context->TrustFile(options.caFile);
-    } else if (options.thumbprint.empty()) {
-      context->TrustSystemStore();
-    }
-  }
-  config.sslContext = context.get();         // null for plain http
-  return CreateSecurityTokenService(config); // takes its own reference to the context
+  const Tarvel::Ref<Tarvel::Ssl::SSLContext> context = CreateContext(options);
+  config.sslContext = context.get();                         // null for plain http
+  return CreateSecurityTokenService(config, serviceOptions); // takes its own reference to the context
 }
 
 } // namespace SsoClient::Tool

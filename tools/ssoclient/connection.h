@@ -6,7 +6,10 @@
 
 #include <ssoclient/holder_of_key_config.h>
 #include <ssoclient/security_token_service.h>
+#include <ssoclient/service_options.h>
+#include <tarvel/core/ref.h>
 #include <tarvel/crypto/certificate.h>
+#include <tarvel/ssl/ssl_context.h>
 
 #include <boost/optional.hpp>
 
@@ -33,10 +36,15 @@ void AddConnectionOptions(CLI::App &app, ConnectionOptions &options);
 /// @throws Tarvel::Http::MalformedURLException
 void CheckConnection(const ConnectionOptions &options);
 
+/// What the connections to the service trust; null for plain http.
+/// @throws Tarvel::IOException, Tarvel::Crypto::CryptoException
+Tarvel::Ref<Tarvel::Ssl::SSLContext> CreateContext(const ConnectionOptions &options);
+
 /// A client of the service. Nothing is connected yet.
 /// @throws Tarvel::IOException, Tarvel::Crypto::CryptoException
 std::shared_ptr<SecurityTokenService> CreateService(const ConnectionOptions &options,
                                                     const Tarvel::Crypto::CertificateList &trusted,
-                                                    const boost::optional<HolderOfKeyConfig> &identity);
+                                                    const boost::optional<HolderOfKeyConfig> &identity,
+                                                    const ServiceOptions &serviceOptions);
 
 } // namespace SsoClient::Tool

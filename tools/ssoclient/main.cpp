@@ -47,12 +47,17 @@ constexpr Command COMMANDS[] = {
      DefineValidate},
     {"verify", "Check a token as a relying service does, and show what it says",
      "  ssoclient verify --trust sts.pem token.xml\n"
+     "  ssoclient verify --trust sts.pem --explain token.xml\n"
      "  ssoclient verify --trust sts.pem --trust next-sts.pem --tolerance 60 --format json - <token.xml\n",
      DefineVerify},
-    {"inspect", "Show what a token says, without checking its signature or dates",
+    {"inspect", "Show what a token says, and what deviates in it, without verifying it",
      "  ssoclient inspect token.xml\n"
      "  ssoclient inspect --format json - <token.xml\n",
      DefineInspect},
+    {"doctor", "Find out why a service cannot be used, without sending it any credential",
+     "  ssoclient doctor --sts https://sts.corp.example/sts --ca ca.pem --trust sts.pem\n"
+     "  ssoclient doctor --sts https://sts.corp.example/sts --ca ca.pem --timeout 5 --format json\n",
+     DefineDoctor},
 };
 
 /// The format that the command line asks for; works also for a command line that has errors.
@@ -136,7 +141,8 @@ void AddOutputOptions(CLI::App &app, OutputOptions &output) {
       ->default_str("text")
       ->type_name("FORMAT");
   AddFlag(app, "-v,--verbose", output.verbose,
-          "Write the library's log lines to standard error, and warnings even when the format is json");
+          "Write log lines, and the requests and responses without their content, to standard error; and warnings even "
+          "when the format is json");
 }
 
 int Run(int argc, char **argv) {

@@ -76,6 +76,11 @@ Option Option::Within(std::int64_t least, std::int64_t most) const {
   return *this;
 }
 
+Option Option::OneOf(const std::vector<std::string> &choices) const {
+  m_option->check(CLI::IsMember(choices));
+  return *this;
+}
+
 Option Option::Needs(const Option &other) const {
   m_option->needs(other.m_option);
   return *this;

@@ -32,6 +32,8 @@ public:
   Option ShowDefault() const;
   /// The argument is a number from `least` to `most`.
   Option Within(std::int64_t least, std::int64_t most) const;
+  /// The argument is one of `choices`.
+  Option OneOf(const std::vector<std::string> &choices) const;
   /// A command line with this option and without `other` is refused.
   Option Needs(const Option &other) const;
   /// A command line with both options is refused.

@@ -71,14 +71,23 @@ void Warn(std::string_view message, const OutputOptions &output) {
   }
 }
 
+void WriteLine(std::string_view text) {
+  // What the library writes is cut already, but escapes make it longer.
+  const std::string line =
+      "ssoclient: " +
+      Tarvel::StringUtil::Shorten(Tarvel::StringUtil::Printable(text), Tarvel::StringUtil::MAX_LINE_BYTES) + "\n";
+  std::fputs(line.c_str(), stderr);
+}
+
+void Note(std::string_view message, const OutputOptions &output) {
+  if (output.format != Format::JSON || output.verbose) {
+    WriteLine(message);
+  }
+}
+
 void ShowLibraryLog() {
-  Tarvel::Service::GetApp().GetRootLogger()->SetSink([](const Tarvel::Service::LogRecord &record) {
-    // The logger has already cut the message, but escapes make it longer.
-    const std::string text =
-        Tarvel::StringUtil::Shorten(Tarvel::StringUtil::Printable(record.message), Tarvel::StringUtil::MAX_LINE_BYTES);
-    const std::string line = "ssoclient: log: " + text + "\n";
-    std::fputs(line.c_str(), stderr);
-  });
+  Tarvel::Service::GetApp().GetRootLogger()->SetSink(
+      [](const Tarvel::Service::LogRecord &record) { WriteLine("log: " + std::string(record.message)); });
 }
 
 void ReportFailure(const std::exception &failure, Format format) {
@@ -94,7 +103,7 @@ void ReportFailure(const std::exception &failure, Format format) {
   } else {
     lines = "ssoclient: " + std::string(known.label) + ": " + PrintableValue(failure.what()) + "\n";
     if (hinted) {
-      lines += "ssoclient: hint: " + hinted->GetHint() + "\n";
+      lines += "ssoclient: hint: " + PrintableValue(hinted->GetHint()) + "\n";
     }
   }
   std::fputs(lines.c_str(), stderr);

@@ -38,6 +38,13 @@ void Warn(std::string_view message);
 /// programs expect only the failure's object on standard error.
 void Warn(std::string_view message, const OutputOptions &output);
 
+/// Writes `text` to standard error as one printable line, which is cut at the length of a line
+/// (`Tarvel::StringUtil::MAX_LINE_BYTES`).
+void WriteLine(std::string_view text);
+
+/// The same for a message that a failure may follow, so that it is written in JSON only when verbose.
+void Note(std::string_view message, const OutputOptions &output);
+
 /// From now on each line that the library logs is written to standard error.
 void ShowLibraryLog();
 

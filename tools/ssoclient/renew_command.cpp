@@ -5,6 +5,8 @@
 #include "command.h"
 #include "connection.h"
 #include "identity.h"
+#include "operation_events.h"
+#include "refused_token.h"
 #include "service_call.h"
 #include "token_output.h"
 #include "token_spec_options.h"
@@ -39,10 +41,15 @@ ExitCode Renew(const RenewOptions &options, const OutputOptions &output) {
 
   const Tarvel::Crypto::CertificateList trusted = LoadTrusted(options.trust, output);
   const auto given = ReadToken(options.file, trusted, options.trust.toleranceSec);
-  const auto service = CreateService(options.connection, trusted, LoadIdentity(options.identity));
-  const IssuedToken issued =
-      AskForToken([&] { return service->RenewToken(*given, spec.tokenLifetimeSec); }, nullptr, output);
-  RequireWithinTolerance(*issued.token, trusted, options.trust.toleranceSec);
+  RefusedToken refused(options.tokenOutput, output);
+  const auto service = CreateService(options.connection, trusted, LoadIdentity(options.identity),
+                                     {{}, ObserverFor(output), refused.GetSink()});
+  const IssuedToken issued = refused.Explain([&] {
+    IssuedToken renewed =
+        AskForToken([&] { return service->RenewToken(*given, spec.tokenLifetimeSec); }, nullptr, output);
+    RequireWithinTolerance(*renewed.token, trusted, options.trust.toleranceSec, refused.GetSink());
+    return renewed;
+  });
   WriteToken(issued, spec, options.trust.toleranceSec, options.tokenOutput, output);
   return ExitCode::DONE;
 }

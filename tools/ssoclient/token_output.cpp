@@ -5,7 +5,7 @@
 #include "atomic_file.h"
 #include "exit_code.h"
 #include "option.h"
-#include "token_report.h"
+#include "token_view.h"
 #include "unmet_request.h"
 
 #include <tarvel/core/exception.h>
@@ -34,6 +34,10 @@ void AddTokenOutputOptions(CLI::App &app, TokenOutputOptions &options) {
             "nothing else is then written")
       .TypeName("FILE")
       .Group(GROUP);
+  AddOption(app, "--save-refused", options.refusedFile,
+            "File for a token that the service issues and the tool refuses, mode 0600; it is secret")
+      .TypeName("FILE")
+      .Group(GROUP);
   AddFlag(app, "--force", options.replace, "Replace an existing file").Group(GROUP);
 }
 
@@ -44,27 +48,36 @@ void CheckTokenOutput(const TokenOutputOptions &options, const OutputOptions &ou
   if (!options.file.empty() && options.file != STANDARD_OUTPUT) {
     RequireWritableFile(options.file, options.replace);
   }
+  if (options.refusedFile == STANDARD_OUTPUT) {
+    throw UsageException("--save-refused needs a file; a refused token is not written to standard output");
+  }
+  if (!options.refusedFile.empty()) {
+    if (options.refusedFile == options.file) {
+      throw UsageException("--out and --save-refused must be different files");
+    }
+    RequireWritableFile(options.refusedFile, options.replace);
+  }
 }
 
 void WriteToken(const IssuedToken &issued, const TokenSpec &spec, std::int64_t toleranceSec,
                 const TokenOutputOptions &options, const OutputOptions &output) {
-  TokenReport report = ReportOf(*issued.token);
-  report.unmet = FindUnmet(spec, issued.askedAt, report.facts, toleranceSec);
-  for (const UnmetRequest &request : *report.unmet) {
+  TokenView view = ViewOf(*issued.token);
+  view.unmet = FindUnmet(spec, issued.askedAt, *view.facts, toleranceSec);
+  for (const UnmetRequest &request : *view.unmet) {
     Warn("asked for, but not given by the service: " + request.wanted);
   }
 
   if (options.file == STANDARD_OUTPUT) {
-    WriteOutput(Render(report, Format::XML));
+    WriteOutput(Render(view, Format::XML));
     return;
   }
   if (options.file.empty()) {
-    WriteOutput(Render(report, output.format));
+    WriteOutput(Render(view, output.format));
     return;
   }
-  WriteFileWhole(options.file, Render(report, Format::XML), options.replace);
+  WriteFileWhole(options.file, Render(view, Format::XML), options.replace);
   if (output.format != Format::XML) {
-    ShowToken(options.file, Render(report, output.format));
+    ShowToken(options.file, Render(view, output.format));
   }
 }
 

@@ -19,7 +19,8 @@ class App;
 namespace SsoClient::Tool {
 
 struct TokenOutputOptions {
-  std::string file; ///< "-" is standard output; empty: the token is only shown
+  std::string file;        ///< "-" is standard output; empty: the token is only shown
+  std::string refusedFile; ///< for a token that the tool refuses; empty: it is discarded
   bool replace = false;
 };
 

@@ -2,13 +2,17 @@
 
 #include "trust.h"
 
+#include "exit_code.h"
 #include "option.h"
 
+#include <ssoclient/exceptions.h>
 #include <tarvel/system/date_time.h>
 #include <tarvel/xml/parser.h>
 
 namespace SsoClient::Tool {
 namespace {
+
+constexpr const char *EXPLAIN_HINT = "ssoclient verify --explain shows each check of the token, and what to do";
 
 void WarnOfDates(const Tarvel::Crypto::CertificateList &trusted, const OutputOptions &output) {
   const Tarvel::System::DateTime now = Tarvel::System::GetUtcDateTime();
@@ -52,17 +56,39 @@ Tarvel::Crypto::CertificateList LoadTrusted(const TrustOptions &options, const O
   return trusted;
 }
 
+std::string ReadTokenText(const std::string &file) {
+  // One octet more than the parser accepts, so that the parser refuses what is too long.
+  return ReadInput(file, Tarvel::Xml::MAX_DOCUMENT_BYTES + 1);
+}
+
+std::shared_ptr<const SamlToken> ReadToken(const std::string &file, const TokenVerifier &verifier) {
+  const std::string xml = ReadTokenText(file);
+  try {
+    return verifier.Verify(xml);
+  } catch (const InvalidTokenException &refusal) {
+    throw HintedException(refusal, EXPLAIN_HINT);
+  } catch (const Tarvel::Xml::XMLParseException &refusal) {
+    throw HintedException(refusal, EXPLAIN_HINT);
+  }
+}
+
 std::shared_ptr<const SamlToken> ReadToken(const std::string &file, const Tarvel::Crypto::CertificateList &trusted,
                                            std::int64_t toleranceSec) {
-  // One octet more than the parser accepts, so that the parser refuses what is too long.
-  const std::string xml = ReadInput(file, Tarvel::Xml::MAX_DOCUMENT_BYTES + 1);
-  return CreateSamlToken(xml, trusted, toleranceSec);
+  VerifyOptions options;
+  options.clockToleranceSec = toleranceSec;
+  return ReadToken(file, TokenVerifier(trusted, options));
 }
 
 void RequireWithinTolerance(const SamlToken &token, const Tarvel::Crypto::CertificateList &trusted,
-                            std::int64_t toleranceSec) {
-  if (toleranceSec < DEFAULT_CLOCK_TOLERANCE_SEC) {
+                            std::int64_t toleranceSec, const ServiceOptions::RefusedTokenSink &sink) {
+  if (toleranceSec >= DEFAULT_CLOCK_TOLERANCE_SEC) {
+    return;
+  }
+  try {
     CreateSamlToken(token.ToXml(), trusted, toleranceSec);
+  } catch (const InvalidTokenException &) {
+    sink(token.ToXml());
+    throw;
   }
 }
 

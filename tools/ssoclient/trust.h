@@ -8,6 +8,8 @@
 
 #include <ssoclient/create_saml_token.h>
 #include <ssoclient/saml_token.h>
+#include <ssoclient/service_options.h>
+#include <ssoclient/token_verifier.h>
 #include <tarvel/crypto/certificate.h>
 
 #include <cstdint>
@@ -35,15 +37,24 @@ void AddTokenArgument(CLI::App &app, std::string &file);
 /// @throws Tarvel::IOException, Tarvel::Crypto::CryptoException
 Tarvel::Crypto::CertificateList LoadTrusted(const TrustOptions &options, const OutputOptions &output);
 
-/// The token in `file` ("-" is standard input), verified.
-/// @throws Tarvel::IOException and what `CreateSamlToken` throws.
+/// What `file` contains ("-" is standard input): all of it, or enough of a file that is too long for the parser to refuse it.
+/// @throws Tarvel::IOException
+std::string ReadTokenText(const std::string &file);
+
+/// The token in `file`, verified.
+/// @throws Tarvel::IOException
+/// @throws HintedException for a token that is refused, as the exception of `TokenVerifier::Verify`.
+std::shared_ptr<const SamlToken> ReadToken(const std::string &file, const TokenVerifier &verifier);
+
+/// The same with no demands but a tolerance.
 std::shared_ptr<const SamlToken> ReadToken(const std::string &file, const Tarvel::Crypto::CertificateList &trusted,
                                            std::int64_t toleranceSec);
 
 /// Checks again, with `toleranceSec`, a token that the library has accepted with `DEFAULT_CLOCK_TOLERANCE_SEC`; does
 /// nothing unless `toleranceSec` is less.
+/// @param sink gets the text of a token that is refused
 /// @throws ParseException
 void RequireWithinTolerance(const SamlToken &token, const Tarvel::Crypto::CertificateList &trusted,
-                            std::int64_t toleranceSec);
+                            std::int64_t toleranceSec, const ServiceOptions::RefusedTokenSink &sink);
 
 } // namespace SsoClient::Tool

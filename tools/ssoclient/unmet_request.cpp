@@ -2,7 +2,7 @@
 
 #include "unmet_request.h"
 
-#include <ssoclient/create_saml_token.h>
+#include <ssoclient/verify_options.h>
 
 #include <algorithm>
 
@@ -86,9 +86,12 @@ void CheckAudience(const TokenSpec &spec, const TokenFacts &facts, std::vector<U
 /// far enough apart and the difference of the clocks explains the rest.
 bool LastsLongEnough(std::int64_t lifetimeSec, const Tarvel::System::DateTime &askedAt, const TokenFacts &facts,
                      std::int64_t toleranceSec) {
+  if (!facts.startDate || !facts.endDate) {
+    return false;
+  }
   const std::int64_t least = (lifetimeSec - ROUNDING_SEC) * MICROSECONDS_PER_SECOND;
-  const std::int64_t left = facts.endDate.GetUtcTime() - askedAt.GetUtcTime();
-  const std::int64_t span = facts.endDate.GetUtcTime() - facts.startDate.GetUtcTime();
+  const std::int64_t left = facts.endDate->MicrosecondsSince(askedAt);
+  const std::int64_t span = facts.endDate->MicrosecondsSince(*facts.startDate);
   const std::int64_t tolerance =
       std::clamp<std::int64_t>(toleranceSec, 0, DEFAULT_CLOCK_TOLERANCE_SEC) * MICROSECONDS_PER_SECOND;
   return left > least || (span > least && left + tolerance > least);
@@ -100,17 +103,18 @@ std::vector<UnmetRequest> FindUnmet(const TokenSpec &spec, const Tarvel::System:
                                     const TokenFacts &facts, std::int64_t toleranceSec) {
   std::vector<UnmetRequest> unmet;
   CheckDelegation(spec, facts, unmet);
-  if (spec.renewable && !facts.renewable) {
+  if (spec.renewable && !facts.renewable.value_or(false)) {
     unmet.push_back({"renewable", "a renewable token"});
   }
-  if (spec.delegable && !facts.delegable) {
+  if (spec.delegable && !facts.delegable.value_or(false)) {
     unmet.push_back({"delegable", "a delegable token"});
   }
   CheckAdvice(spec, facts, unmet);
   CheckAudience(spec, facts, unmet);
   if (!LastsLongEnough(spec.tokenLifetimeSec, askedAt, facts, toleranceSec)) {
     unmet.push_back({"lifetime", "a lifetime of " + std::to_string(spec.tokenLifetimeSec) +
-                                     " seconds; the token ends at " + facts.endDate.ToString()});
+                                     " seconds; the token ends at " +
+                                     (facts.endDate ? facts.endDate->ToString() : "no known time")});
   }
   return unmet;
 }

@@ -4,6 +4,7 @@
 
 #include "command.h"
 #include "connection.h"
+#include "operation_events.h"
 #include "service_call.h"
 #include "trust.h"
 
@@ -34,7 +35,7 @@ ExitCode Validate(const ValidateOptions &options, const OutputOptions &output) {
 
   const Tarvel::Crypto::CertificateList trusted = LoadTrusted(options.trust, output);
   const auto token = ReadToken(options.file, trusted, options.trust.toleranceSec);
-  const auto service = CreateService(options.connection, trusted, boost::none);
+  const auto service = CreateService(options.connection, trusted, boost::none, {{}, ObserverFor(output), {}});
   const bool isValid = CallService([&] { return service->ValidateSubject(*token); });
   WriteOutput(RenderVerdict(isValid, output.format));
   return isValid ? ExitCode::DONE : ExitCode::TOKEN_INVALID;

@@ -143,6 +143,19 @@ bool HasAcceptableExponent(const Certificate &certificate) {
   return AsImpl(certificate).HasAcceptableExponent();
 }
 
+std::string RefuseKey(const Certificate &certificate) {
+  unsigned bits = 0;
+  const KeyKind kind = GetKeyKind(certificate, bits);
+  if (kind == KeyKind::OTHER) {
+    return "the key is neither RSA nor on the curves P-256, P-384 and P-521";
+  }
+  if (kind == KeyKind::RSA && bits < MIN_RSA_BITS) {
+    return "the RSA key has only " + std::to_string(bits) + " bits; " + std::to_string(MIN_RSA_BITS) +
+           " are the minimum";
+  }
+  return HasAcceptableExponent(certificate) ? "" : "the RSA key's public exponent is even or 1";
+}
+
 bool VerifyDigest(const Certificate &certificate, SignatureScheme scheme, DigestAlgorithm algorithm,
                   const std::uint8_t *digest, const std::uint8_t *signature, std::size_t signatureLength) {
   const CertificateImpl &impl = AsImpl(certificate);

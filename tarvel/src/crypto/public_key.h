@@ -11,6 +11,7 @@
 
 #include <cstddef>
 #include <cstdint>
+#include <string>
 #include <string_view>
 #include <vector>
 
@@ -20,11 +21,18 @@ enum class SignatureScheme { RSA_PKCS1, RSA_PSS, ECDSA };
 
 enum class KeyKind { RSA, EC_P256, EC_P384, EC_P521, OTHER };
 
+/// A shorter RSA key is not accepted.
+constexpr unsigned MIN_RSA_BITS = 2048;
+
 /// The kind of the certificate's public key. `bits` is set to the size of the RSA modulus or of the curve's order.
 KeyKind GetKeyKind(const Certificate &certificate, unsigned &bits);
 
 /// Whether an RSA key's public exponent is odd and at least 3; true for other kinds of keys.
 bool HasAcceptableExponent(const Certificate &certificate);
+
+/// Why no signature by the certificate's key is accepted, whatever its scheme; empty when signatures may be. An accepted
+/// key is RSA with at least `MIN_RSA_BITS` and an acceptable exponent, or EC on P-256, P-384 or P-521.
+std::string RefuseKey(const Certificate &certificate);
 
 /// Whether `signature` is the signature by the certificate's key over a message with that digest. An ECDSA value is r
 /// and s one after the other, as in XML Signature (RFC 4050, section 3.3). RSA-PSS uses MGF1 with the same digest, and

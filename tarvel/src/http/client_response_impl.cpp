@@ -9,7 +9,7 @@
 
 namespace Tarvel::Http {
 
-ClientResponseImpl::ClientResponseImpl(ResponseData data) : m_data(std::move(data)) {
+ClientResponseImpl::ClientResponseImpl(ResponseData data) : m_data(std::move(data)), m_bodyLength(m_data.body.size()) {
   RecodeToUtf8(m_data.body, GetDeclaredCharset());
 }
 
@@ -47,6 +47,10 @@ bool ClientResponseImpl::GetHeader(std::string_view name, std::string &value) co
   }
   value = found->second;
   return true;
+}
+
+std::size_t ClientResponseImpl::GetBodyLength() const noexcept {
+  return m_bodyLength;
 }
 
 } // namespace Tarvel::Http

@@ -24,12 +24,14 @@ public:
   int GetStatusCode() const noexcept override;
   const std::string &GetReasonPhrase() const noexcept override;
   bool GetHeader(std::string_view name, std::string &value) const override;
+  std::size_t GetBodyLength() const noexcept override;
 
 private:
   ~ClientResponseImpl() override = default;
 
   ResponseData m_data;
-  std::size_t m_position = 0; // in the body
+  const std::size_t m_bodyLength; // as received
+  std::size_t m_position = 0;     // in the body
 };
 
 } // namespace Tarvel::Http

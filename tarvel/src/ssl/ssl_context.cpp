@@ -138,9 +138,14 @@ void SSLContextImpl::SetClientCertificate(const Ref<const Crypto::Certificate> &
 }
 
 Ref<SSLStream> SSLContextImpl::CreateStream(const Ref<System::Stream> &stream, const std::string &endpoint) {
+  return CreateRecordedStream(stream, endpoint, nullptr);
+}
+
+Ref<SSLStream> SSLContextImpl::CreateRecordedStream(const Ref<System::Stream> &stream, const std::string &endpoint,
+                                                    const std::shared_ptr<HandshakeRecord> &record) {
   const Crypto::OpenSslGuard use;
   use.Require();
-  return MakeRef<SSLStreamImpl>(Ref<SSLContextImpl>(this), stream, endpoint);
+  return MakeRef<SSLStreamImpl>(Ref<SSLContextImpl>(this), stream, endpoint, record);
 }
 
 ConnectionHandle SSLContextImpl::CreateConnection() const {

@@ -9,7 +9,12 @@
 
 #include <tarvel/ssl/ssl_context.h>
 
+#include <memory>
+#include <string>
+
 namespace Tarvel::Ssl {
+
+class HandshakeRecord;
 
 class SSLContextImpl final : public SSLContext {
 public:
@@ -22,6 +27,10 @@ public:
   void SetClientCertificate(const Ref<const Crypto::Certificate> &certificate, const Ref<const Crypto::PrivateKey> &key,
                             const Crypto::CertificateList &intermediates) override;
   Ref<SSLStream> CreateStream(const Ref<System::Stream> &stream, const std::string &endpoint) override;
+
+  /// The same as `CreateStream`, with a record of the handshake; null for none.
+  Ref<SSLStream> CreateRecordedStream(const Ref<System::Stream> &stream, const std::string &endpoint,
+                                      const std::shared_ptr<HandshakeRecord> &record);
 
   /// A connection with this context's settings.
   /// @throws SSLException; the message is the reason. @throws OutOfMemoryException

@@ -32,8 +32,8 @@ void PostRefusal(Handler handler, const char *reason, Arguments... arguments) {
 } // namespace
 
 SSLStreamImpl::SSLStreamImpl(const Ref<SSLContextImpl> &context, const Ref<System::Stream> &stream,
-                             const std::string &endpoint)
-    : m_lower(stream), m_host(endpoint), m_tls(context, endpoint) {}
+                             const std::string &endpoint, const std::shared_ptr<HandshakeRecord> &record)
+    : m_lower(stream), m_host(endpoint), m_tls(context, endpoint, record) {}
 
 SSLStreamImpl::~SSLStreamImpl() {
   m_endNotice.Withdraw();

@@ -22,7 +22,9 @@ namespace Tarvel::Ssl {
 
 class SSLStreamImpl final : public SSLStream {
 public:
-  SSLStreamImpl(const Ref<SSLContextImpl> &context, const Ref<System::Stream> &stream, const std::string &endpoint);
+  /// @param record as in `TlsConnection`.
+  SSLStreamImpl(const Ref<SSLContextImpl> &context, const Ref<System::Stream> &stream, const std::string &endpoint,
+                const std::shared_ptr<HandshakeRecord> &record);
 
   void AsyncHandshake(const std::string &host, const std::string &parameter, HandshakeHandler handler) override;
   bool WasResumed() const noexcept override { return m_wasResumed; }

@@ -32,10 +32,25 @@ std::string DescribeSubject(X509 *certificate) {
   return StringUtil::Shorten({data, static_cast<std::size_t>(length)});
 }
 
+/// Why OpenSSL has refused the certificate that it looked at last.
+std::string DescribeRefusal(X509_STORE_CTX *verification) {
+  return std::string("the server's certificate was not accepted: ") +
+         X509_verify_cert_error_string(X509_STORE_CTX_get_error(verification)) + " (certificate \"" +
+         DescribeSubject(X509_STORE_CTX_get_current_cert(verification)) + "\")";
+}
+
+/// The connection whose server is being verified.
+TlsConnection *Find(X509_STORE_CTX *verification) noexcept {
+  const auto *const native =
+      static_cast<SSL *>(X509_STORE_CTX_get_ex_data(verification, SSL_get_ex_data_X509_STORE_CTX_idx()));
+  return static_cast<TlsConnection *>(SSL_get_app_data(native));
+}
+
 } // namespace
 
-TlsConnection::TlsConnection(const Ref<SSLContextImpl> &context, const std::string &endpoint)
-    : m_context(context), m_endpoint(endpoint) {}
+TlsConnection::TlsConnection(const Ref<SSLContextImpl> &context, const std::string &endpoint,
+                             const std::shared_ptr<HandshakeRecord> &record)
+    : m_context(context), m_endpoint(endpoint), m_record(record) {}
 
 void TlsConnection::Begin(const std::string &host, const std::string &parameter) {
   const Crypto::OpenSslErrorScope errors;
@@ -44,8 +59,10 @@ void TlsConnection::Begin(const std::string &host, const std::string &parameter)
   BIO *toSend = nullptr;
   ConnectionHandle connection = MakeConnection(*m_identity, received, toSend);
   m_sessionKey = m_endpoint + '\n' + m_identity->ToKey();
-  if (const SessionHandle session = m_context->GetSessions().Take(m_sessionKey)) {
-    SSL_set_session(connection.get(), session.get()); // if OpenSSL cannot use it, the handshake is a full one
+  if (!m_record) { // a record is one of a full handshake
+    if (const SessionHandle session = m_context->GetSessions().Take(m_sessionKey)) {
+      SSL_set_session(connection.get(), session.get()); // if OpenSSL cannot use it, the handshake is a full one
+    }
   }
   m_received = received;
   m_toSend = toSend;
@@ -80,6 +97,9 @@ void TlsConnection::PrepareSteps() noexcept {
 TlsConnection::Progress TlsConnection::Handshake() {
   const Crypto::OpenSslErrorScope errors;
   const int result = SSL_do_handshake(m_connection.get());
+  if (m_record) {
+    m_record->NoteProtocol(m_connection.get());
+  }
   if (result != 1) {
     return Examine(result, errors);
   }
@@ -129,6 +149,9 @@ TlsConnection::Progress TlsConnection::Examine(int result, const Crypto::OpenSsl
     throw OutOfMemoryException();
   }
   errors.RequireMemory();
+  if (m_record) {
+    m_record->NoteError(errors.PeekNewest());
+  }
   if (error == SSL_ERROR_ZERO_RETURN) {
     m_reason = "the server ended the connection";
   } else {
@@ -158,9 +181,7 @@ void TlsConnection::OnMessage(int, int, int, const void *, std::size_t, SSL *, v
 }
 
 int TlsConnection::OnVerifyServer(X509_STORE_CTX *verification, void *) noexcept {
-  const auto *const native =
-      static_cast<SSL *>(X509_STORE_CTX_get_ex_data(verification, SSL_get_ex_data_X509_STORE_CTX_idx()));
-  auto *const self = static_cast<TlsConnection *>(SSL_get_app_data(native));
+  TlsConnection *const self = Find(verification);
   // If memory ran out while the certificate was read, verification refuses it, but for another reason.
   const bool lacksMemory = errno == ENOMEM;
   try {
@@ -181,22 +202,56 @@ int TlsConnection::OnVerifyServer(X509_STORE_CTX *verification, void *) noexcept
 
 /// Why the server's certificate is not accepted; empty when it is.
 std::string TlsConnection::VerifyServer(X509_STORE_CTX *verification) const {
-  if (m_identity->HasThumbprint()) {
-    std::string refusal = m_identity->RefuseByThumbprint(X509_STORE_CTX_get0_cert(verification));
-    X509_STORE_CTX_set_error(verification, refusal.empty() ? X509_V_OK : X509_V_ERR_APPLICATION_VERIFICATION);
-    return refusal;
+  if (m_record) {
+    m_record->NoteChain(verification);
   }
+  return m_identity->HasThumbprint() ? VerifyThumbprint(verification) : VerifyChain(verification);
+}
+
+std::string TlsConnection::VerifyThumbprint(X509_STORE_CTX *verification) const {
+  std::string refusal = m_identity->RefuseByThumbprint(X509_STORE_CTX_get0_cert(verification));
+  X509_STORE_CTX_set_error(verification, refusal.empty() ? X509_V_OK : X509_V_ERR_APPLICATION_VERIFICATION);
+  if (m_record && !refusal.empty()) {
+    m_record->NoteOtherThumbprint(refusal);
+  }
+  return refusal;
+}
+
+std::string TlsConnection::VerifyChain(X509_STORE_CTX *verification) const {
   const Crypto::OpenSslErrorScope errors;
-  if (X509_verify_cert(verification) == 1) {
-    return {};
+  if (m_record) {
+    X509_STORE_CTX_set_verify_cb(verification, OnVerificationStep);
   }
-  errors.RequireMemory();
-  if (X509_STORE_CTX_get_error(verification) == X509_V_ERR_OUT_OF_MEM) {
-    throw OutOfMemoryException();
+  const bool isVerified = X509_verify_cert(verification) == 1;
+  if (!isVerified) {
+    errors.RequireMemory();
+    if (X509_STORE_CTX_get_error(verification) == X509_V_ERR_OUT_OF_MEM) {
+      throw OutOfMemoryException();
+    }
   }
-  return std::string("the server's certificate was not accepted: ") +
-         X509_verify_cert_error_string(X509_STORE_CTX_get_error(verification)) + " (certificate \"" +
-         DescribeSubject(X509_STORE_CTX_get_current_cert(verification)) + "\")";
+  if (m_record) {
+    m_record->NoteAnchor(verification);
+    if (m_record->HasRefusals()) { // verification has gone on after them
+      X509_STORE_CTX_set_error(verification, m_record->GetFirstCode());
+      return m_record->GetFirstText();
+    }
+  }
+  return isVerified ? std::string() : DescribeRefusal(verification);
+}
+
+int TlsConnection::OnVerificationStep(int isAccepted, X509_STORE_CTX *verification) noexcept {
+  if (isAccepted == 1) {
+    return 1;
+  }
+  TlsConnection *const self = Find(verification);
+  try {
+    self->m_record->NoteRefusal(verification, DescribeRefusal(verification));
+    return 1;
+  } catch (...) {
+    self->m_lacksMemory = true; // ends the verification, and with it the handshake
+    X509_STORE_CTX_set_error(verification, X509_V_ERR_OUT_OF_MEM);
+    return 0;
+  }
 }
 
 int TlsConnection::OnNewSession(SSL *connection, SSL_SESSION *session) noexcept {
@@ -225,6 +280,9 @@ void TlsConnection::AddClosingNotice() {
 void TlsConnection::PutInput(const char *bytes, std::size_t count) {
   if (BIO_write(m_received, bytes, static_cast<int>(count)) != static_cast<int>(count)) {
     throw OutOfMemoryException();
+  }
+  if (m_record) {
+    m_record->NoteInput(bytes, count);
   }
 }
 

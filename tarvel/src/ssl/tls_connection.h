@@ -6,11 +6,13 @@
 #pragma once
 
 #include "crypto/openssl_errors.h"
+#include "ssl/handshake_record.h"
 #include "ssl/server_identity.h"
 #include "ssl/ssl_context_impl.h"
 #include "ssl/ssl_handles.h"
 
 #include <cstddef>
+#include <memory>
 #include <optional>
 #include <string>
 #include <utility>
@@ -29,7 +31,10 @@ public:
   static constexpr std::size_t RECORD_BYTES = 16384;
 
   /// @param endpoint a part of the key under which sessions are remembered.
-  TlsConnection(const Ref<SSLContextImpl> &context, const std::string &endpoint);
+  /// @param record notes what the handshake shows, and makes the verification go on after the first reason against a
+  ///        certificate; the server is refused all the same. Null for none.
+  TlsConnection(const Ref<SSLContextImpl> &context, const std::string &endpoint,
+                const std::shared_ptr<HandshakeRecord> &record);
   TlsConnection(const TlsConnection &) = delete;
   TlsConnection &operator=(const TlsConnection &) = delete;
   ~TlsConnection() = default;
@@ -105,10 +110,15 @@ private:
   /// Why the server is refused; empty when it is accepted.
   std::string RefuseServer() const;
   std::string VerifyServer(X509_STORE_CTX *verification) const;
+  std::string VerifyThumbprint(X509_STORE_CTX *verification) const;
+  std::string VerifyChain(X509_STORE_CTX *verification) const;
+  /// Called by OpenSSL for each certificate and each reason against one, when there is a record.
+  static int OnVerificationStep(int isAccepted, X509_STORE_CTX *verification) noexcept;
   void KeepSession(SessionHandle session);
 
   const Ref<SSLContextImpl> m_context;
   const std::string m_endpoint;
+  const std::shared_ptr<HandshakeRecord> m_record; // null for none
   std::optional<ServerIdentity> m_identity;
   std::string m_sessionKey;
   std::string m_reason;

@@ -80,6 +80,29 @@ std::int32_t LocalBiasMinutes(std::int64_t utcMicroseconds) {
   return isWritable ? static_cast<std::int32_t>(bias) : 0;
 }
 
+/// Reads a point in time and its bias. They are set only if the text is not refused.
+DateTimeRefusal ReadDateTime(std::string_view text, std::int64_t &utcMicroseconds, std::int32_t &biasMinutes) noexcept {
+  DateTimeFields fields{};
+  if (const DateTimeRefusal refusal = ReadDateTimeText(text, fields)) {
+    return refusal;
+  }
+  const year_month_day date(std::chrono::year(fields.year), std::chrono::month(fields.month),
+                            std::chrono::day(fields.day));
+  if (!date.ok()) {
+    return {"the month does not have that day"};
+  }
+  const microseconds timeOfDay = std::chrono::hours(fields.hour) + minutes(fields.minute) +
+                                 std::chrono::seconds(fields.second) + microseconds(fields.microsecond);
+  const std::int64_t shown = MicrosecondsAt(date) + timeOfDay.count();
+  const std::int64_t utc = shown - microseconds(minutes(fields.biasMinutes)).count();
+  if (!IsInRange(shown) || !IsInRange(utc)) {
+    return {"outside the years 1 to 9999"};
+  }
+  utcMicroseconds = utc;
+  biasMinutes = fields.biasMinutes;
+  return {};
+}
+
 void AppendDigits(std::string &text, int value, int digits) {
   text.append(static_cast<std::size_t>(digits), '0');
   for (std::size_t i = text.size(); digits > 0; --digits, value /= 10) {
@@ -98,21 +121,13 @@ std::int64_t SecondsToMicroseconds(std::int64_t seconds) noexcept {
 }
 
 DateTime::DateTime(std::string_view text) {
-  const DateTimeFields fields = ParseDateTimeText(text);
-  const year_month_day date(std::chrono::year(fields.year), std::chrono::month(fields.month),
-                            std::chrono::day(fields.day));
-  if (!date.ok()) {
-    RefuseDateTimeText(text, "the month does not have that day");
+  if (const DateTimeRefusal refusal = ReadDateTime(text, m_utcMicroseconds, m_biasMinutes)) {
+    RefuseDateTimeText(text, refusal);
   }
-  const microseconds timeOfDay = std::chrono::hours(fields.hour) + minutes(fields.minute) +
-                                 std::chrono::seconds(fields.second) + microseconds(fields.microsecond);
-  const std::int64_t shown = MicrosecondsAt(date) + timeOfDay.count();
-  const std::int64_t utc = shown - microseconds(minutes(fields.biasMinutes)).count();
-  if (!IsInRange(shown) || !IsInRange(utc)) {
-    RefuseDateTimeText(text, "outside the years 1 to 9999");
-  }
-  m_utcMicroseconds = utc;
-  m_biasMinutes = fields.biasMinutes;
+}
+
+bool DateTime::TryParse(std::string_view text, DateTime &date) noexcept {
+  return !ReadDateTime(text, date.m_utcMicroseconds, date.m_biasMinutes);
 }
 
 DateTime DateTime::PlusMicroseconds(std::int64_t microseconds) const noexcept {

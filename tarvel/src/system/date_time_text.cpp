@@ -23,7 +23,7 @@ struct Fraction {
   bool isZero; ///< whether every digit is 0, including those finer than a microsecond
 };
 
-/// Reads the text from left to right and refuses it at the first character that is not allowed.
+/// Reads the text from left to right. Whatever follows the first refusal changes nothing.
 class Scanner {
 public:
   explicit Scanner(std::string_view text) noexcept : m_text(text) {}
@@ -39,26 +39,26 @@ public:
     return true;
   }
 
-  void Require(char c) {
+  void Require(char c) noexcept {
     if (!Skip(c)) {
       RefuseForm();
     }
   }
 
-  /// Reads a number of exactly `digits` digits.
-  int Number(int digits, int minimum, int maximum, const char *field) {
+  /// Reads a number of exactly `digits` digits. `refusal` is the reason if it is not from `minimum` to `maximum`.
+  int Number(int digits, int minimum, int maximum, const char *refusal) noexcept {
     int value = 0;
     for (int i = 0; i < digits; ++i) {
       value = value * 10 + Digit();
     }
     if (value < minimum || value > maximum) {
-      Refuse(std::string(field) + " out of range");
+      Refuse({refusal});
     }
     return value;
   }
 
   /// Reads the digits after the point: at least one.
-  Fraction FractionDigits() {
+  Fraction FractionDigits() noexcept {
     int microseconds = 0;
     bool isZero = true;
     int scale = 100'000;
@@ -72,7 +72,7 @@ public:
   }
 
   /// Reads the zone after the time: "Z", an offset, or nothing. @return minutes east of UTC.
-  int Zone() {
+  int Zone() noexcept {
     if (AtEnd() || Skip('Z')) {
       return 0;
     }
@@ -80,67 +80,77 @@ public:
     if (!east) {
       Require('-');
     }
-    const int hours = Number(2, 0, MAX_BIAS_HOURS, "zone");
+    const int hours = Number(2, 0, MAX_BIAS_HOURS, ZONE);
     Require(':');
-    const int minutes = Number(2, 0, hours == MAX_BIAS_HOURS ? 0 : 59, "zone");
+    const int minutes = Number(2, 0, hours == MAX_BIAS_HOURS ? 0 : 59, ZONE);
     return (hours * 60 + minutes) * (east ? 1 : -1);
   }
 
-  void RequireEnd() {
+  void RequireEnd() noexcept {
     if (!AtEnd()) {
       RefuseForm();
     }
   }
 
-  [[noreturn]] void Refuse(std::string_view reason) const { RefuseDateTimeText(m_text, reason); }
+  void Refuse(const DateTimeRefusal &refusal) noexcept {
+    if (!m_refusal) {
+      m_refusal = refusal;
+    }
+  }
+
+  const DateTimeRefusal &GetRefusal() const noexcept { return m_refusal; }
 
 private:
-  int Digit() {
+  static constexpr const char *ZONE = "zone out of range";
+
+  int Digit() noexcept {
     if (AtEnd() || !IsDigit(m_text[m_position])) {
       RefuseForm();
+      return 0;
     }
     return m_text[m_position++] - '0';
   }
 
-  [[noreturn]] void RefuseForm() const {
-    Refuse(AtEnd() ? "cut short" : "malformed at character " + std::to_string(m_position + 1));
+  void RefuseForm() noexcept {
+    Refuse(AtEnd() ? DateTimeRefusal{"cut short"} : DateTimeRefusal{"malformed at character ", m_position + 1});
   }
 
   std::string_view m_text;
   std::size_t m_position = 0;
+  DateTimeRefusal m_refusal;
 };
 
 } // namespace
 
-DateTimeFields ParseDateTimeText(std::string_view text) {
+DateTimeRefusal ReadDateTimeText(std::string_view text, DateTimeFields &fields) noexcept {
   Scanner scanner(text);
-  DateTimeFields fields{};
-  fields.year = scanner.Number(4, 1, 9999, "year");
+  fields.year = scanner.Number(4, 1, 9999, "year out of range");
   scanner.Require('-');
-  fields.month = static_cast<unsigned>(scanner.Number(2, 1, 12, "month"));
+  fields.month = static_cast<unsigned>(scanner.Number(2, 1, 12, "month out of range"));
   scanner.Require('-');
-  fields.day = static_cast<unsigned>(scanner.Number(2, 1, 31, "day"));
+  fields.day = static_cast<unsigned>(scanner.Number(2, 1, 31, "day out of range"));
   scanner.Require('T');
-  fields.hour = scanner.Number(2, 0, 24, "hour");
+  fields.hour = scanner.Number(2, 0, 24, "hour out of range");
   scanner.Require(':');
-  fields.minute = scanner.Number(2, 0, 59, "minute");
+  fields.minute = scanner.Number(2, 0, 59, "minute out of range");
   scanner.Require(':');
-  fields.second = scanner.Number(2, 0, 59, "second");
+  fields.second = scanner.Number(2, 0, 59, "second out of range");
   const Fraction fraction = scanner.Skip('.') ? scanner.FractionDigits() : Fraction{0, true};
   fields.microsecond = fraction.microseconds;
   fields.biasMinutes = scanner.Zone();
   scanner.RequireEnd();
   if (fields.hour == 24 && (fields.minute != 0 || fields.second != 0 || !fraction.isZero)) {
-    scanner.Refuse("hour out of range");
+    scanner.Refuse({"hour out of range"});
   }
-  return fields;
+  return scanner.GetRefusal();
 }
 
-void RefuseDateTimeText(std::string_view text, std::string_view reason) {
-  std::string quoted = StringUtil::Shorten(text);
+void RefuseDateTimeText(std::string_view text, const DateTimeRefusal &refusal) {
+  std::string message = "\"" + StringUtil::Shorten(text) + "\" is not a date-time: ";
   // A message is read as a C string: a NUL would end it before its reason.
-  std::replace(quoted.begin(), quoted.end(), '\0', '?');
-  throw DateTimeFormatException("\"" + quoted + "\" is not a date-time: " + std::string(reason));
+  std::replace(message.begin(), message.end(), '\0', '?');
+  message += refusal.reason;
+  throw DateTimeFormatException(refusal.character ? message + std::to_string(refusal.character) : message);
 }
 
 } // namespace Tarvel::System

@@ -4,7 +4,9 @@
 
 #pragma once
 
+#include <cstddef>
 #include <cstdint>
+#include <string>
 #include <string_view>
 
 namespace Tarvel::System {
@@ -21,11 +23,18 @@ struct DateTimeFields {
   std::int32_t biasMinutes; ///< minutes east of UTC, -840 to 840
 };
 
-/// Splits `text` into its fields.
-/// @throws DateTimeFormatException when `text` has another form, or a field is out of its range.
-DateTimeFields ParseDateTimeText(std::string_view text);
+/// Why a text is not a date-time, in a form that costs nothing until it is read.
+struct DateTimeRefusal {
+  const char *reason = nullptr; ///< null if the text is not refused
+  std::size_t character = 0;    ///< from 1; 0 if the reason is not about a character
+
+  explicit operator bool() const noexcept { return reason; }
+};
+
+/// Splits `text` into its fields, unless it has another form, or a field is out of its range.
+DateTimeRefusal ReadDateTimeText(std::string_view text, DateTimeFields &fields) noexcept;
 
 /// Throws a `DateTimeFormatException` that quotes `text`.
-[[noreturn]] void RefuseDateTimeText(std::string_view text, std::string_view reason);
+[[noreturn]] void RefuseDateTimeText(std::string_view text, const DateTimeRefusal &refusal);
 
 } // namespace Tarvel::System

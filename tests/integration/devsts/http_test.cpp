@@ -35,6 +35,14 @@ TEST_F(Http, ConnectionIsKeptForFurtherRequests) {
   }
 }
 
+TEST_F(Http, AnswersHaveTheDate) {
+  TlsClient client(m_service);
+  client.Send("GET /sts HTTP/1.1\r\nHost: localhost\r\n\r\n");
+  EXPECT_THAT(client.Receive().head, testing::ContainsRegex("\r\nDate: (Sun|Mon|Tue|Wed|Thu|Fri|Sat), [0-3][0-9] "
+                                                            "[A-Z][a-z][a-z] 20[0-9][0-9] "
+                                                            "[0-2][0-9]:[0-5][0-9]:[0-5][0-9] GMT\r\n"));
+}
+
 TEST_F(Http, ConnectionIsClosedWhenTheClientAsksForIt) {
   TlsClient client(m_service);
   const SsoClient::Request request = PasswordRequest();

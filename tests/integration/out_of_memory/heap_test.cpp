@@ -1,10 +1,13 @@
 // SPDX-License-Identifier: Apache-2.0
-// Whichever allocation of C++ fails while a document is read or a token is verified: the call either has the same result as
-// with enough memory or throws `std::bad_alloc`.
+// Whichever allocation of C++ fails while a document is read, or a token is verified or explained: the call either has the
+// same result as with enough memory or throws `std::bad_alloc`.
 #include "integration/out_of_memory/failing_heap.h"
 #include "support/data_file.h"
+#include "support/fixed_environment.h"
+#include "support/report_texts.h"
 
 #include <ssoclient/create_saml_token.h>
+#include <ssoclient/token_verifier.h>
 #include <tarvel/crypto/certificate.h>
 #include <tarvel/io/reader.h>
 #include <tarvel/xml/document.h>
@@ -15,6 +18,7 @@
 #include <functional>
 #include <map>
 #include <new>
+#include <stdexcept>
 #include <string>
 
 namespace {
@@ -120,6 +124,52 @@ TEST(OutOfHeap, NeverCausesATamperedTokenToBeAccepted) {
   std::string xml = ReadDataFile("tokens/bearer.xml");
   xml.replace(xml.find("alice"), 5, "malory");
   ExpectNothingElse(Verification(xml, "sts-rsa"), "Failed to verify signature: token might have been tampered with.");
+}
+
+/// The verifier trusts two keys and demands an audience that the tokens do not have.
+SsoClient::TokenVerifier DemandingVerifier() {
+  SsoClient::VerifyOptions options;
+  options.acceptedAudiences = {"https://a-name-that-is-too-long-for-the-string-itself.example/"};
+  Tarvel::Crypto::CertificateList trusted;
+  for (const char *const name : {"tokens/other.crt", "tokens/sts-rsa.crt"}) {
+    trusted.push_back(Tarvel::Crypto::LoadCertificates(Testing::DataPath(name)).front());
+  }
+  return SsoClient::TokenVerifier(trusted, options);
+}
+
+TEST(OutOfHeap, IsReportedByAVerifier) {
+  const std::string xml = ReadDataFile("tokens/full.xml");
+  const SsoClient::TokenVerifier verifier = DemandingVerifier();
+  ExpectNothingElse(
+      [&] { verifier.Verify(xml); },
+      "The token is restricted to other audiences: https://files.corp.example/, https://mail.corp.example/");
+}
+
+TEST(OutOfHeap, IsReportedWhenAVerifierIsMade) {
+  ExpectNothingElse([] { DemandingVerifier(); }, "done");
+}
+
+/// Explains `xml`, and fails if a report that is returned is not the whole one.
+void ExpectWholeReportOrNoMemory(const std::string &xml) {
+  const Testing::FixedEnvironment clock;
+  const SsoClient::TokenVerifier verifier = DemandingVerifier();
+  const std::string whole = Testing::DescribeReport(verifier.Explain(xml));
+  ExpectNothingElse(
+      [&] {
+        const SsoClient::TokenReport report = verifier.Explain(xml);
+        FailingHeap enough(1'000'000, Shortage::ONCE); // to compare
+        if (Testing::DescribeReport(report) != whole) {
+          throw std::logic_error("another report");
+        }
+      },
+      "done");
+}
+
+TEST(OutOfHeap, NeverLosesPartOfAReport) {
+  ExpectWholeReportOrNoMemory(ReadDataFile("tokens/full.xml"));
+  ExpectWholeReportOrNoMemory(ReadDataFile("attacks/namespace-conditions-rebound.xml"));
+  ExpectWholeReportOrNoMemory(ReadDataFile("attacks/foreign-key-both-certificates.xml"));
+  ExpectWholeReportOrNoMemory(ReadDataFile("attacks/entity-undefined.xml"));
 }
 
 } // namespace

@@ -5,14 +5,20 @@
 #include "support/completion.h"
 #include "support/data_file.h"
 #include "support/dev_sts.h"
+#include "support/fixed_environment.h"
+#include "support/report_texts.h"
 
 #include <ssoclient/create_saml_token.h>
 #include <ssoclient/exceptions.h>
+#include <ssoclient/token_verifier.h>
 #include <tarvel/core/exception.h>
 #include <tarvel/crypto/certificate.h>
 #include <tarvel/crypto/private_key.h>
+#include <tarvel/io/reader.h>
 #include <tarvel/ssl/ssl_context.h>
+#include <tarvel/xml/document.h>
 #include <tarvel/xml/node.h>
+#include <tarvel/xml/parser.h>
 #include <tarvel/xml/security/canonicalizer.h>
 #include <tarvel/xml/security/signature.h>
 
@@ -20,8 +26,10 @@
 
 #include <functional>
 #include <map>
+#include <stdexcept>
 #include <string>
 #include <typeinfo>
+#include <vector>
 
 namespace {
 
@@ -93,6 +101,14 @@ std::string Changed(std::string token) {
   return token.replace(token.find("alice"), 5, "malory");
 }
 
+Tarvel::Crypto::CertificateList LoadTrusted(const std::vector<std::string> &names) {
+  Tarvel::Crypto::CertificateList trusted;
+  for (const std::string &name : names) {
+    trusted.push_back(Tarvel::Crypto::LoadCertificates(DataPath("tokens/" + name + ".crt")).front());
+  }
+  return trusted;
+}
+
 std::function<void()> Verification(const std::string &xml, const std::string &certificate) {
   const auto trusted = Tarvel::Crypto::LoadCertificates(DataPath("tokens/" + certificate + ".crt"));
   return [xml, trusted] { SsoClient::CreateSamlToken(xml, trusted); };
@@ -115,10 +131,50 @@ TEST_F(OutOfMemory, NeverCausesATamperedTokenToBeAccepted) {
   ExpectNothingElse(Verification(Changed(Token("ecdsa-p256-sha256")), "sts-ec256"), TAMPERED);
 }
 
+// The certificate in KeyInfo is not a trusted one, so that it is decoded.
+TEST_F(OutOfMemory, NeverChangesTheReportOnASignature) {
+  const Ref<Tarvel::Reader> reader = Tarvel::CreateStringReader(Token("bearer"));
+  const Ref<Tarvel::Object> parsed =
+      Tarvel::Xml::CreateXMLParser(Tarvel::Xml::CreateXMLDocumentHandler())->Parse(*reader);
+  const auto &root = *dynamic_cast<Tarvel::Xml::Document &>(*parsed).GetDocumentElement();
+  Ref<Tarvel::Xml::Security::Signature> signature;
+  CreateSignatureFromDom(root, *root.FindChildElement("Signature"), signature);
+  const auto resolver = Tarvel::Xml::Security::CreateTrustSetKeyResolver(LoadTrusted({"other", "sts-rsa-reissued"}));
+  ExpectNothingElse([&] {
+    const Tarvel::Xml::Security::SignatureReport report = signature->Explain(*resolver);
+    const auto &stranger = report.namedCertificates.at(0);
+    if (!report.refusals.empty() || !report.keys.at(1).madeSignature || stranger.subject.empty() ||
+        stranger.thumbprint.empty()) {
+      throw std::logic_error("another report");
+    }
+  });
+}
+
 TEST_F(OutOfMemory, IsReportedByVerificationOnTheFirstUseOfAKey) {
   const std::string pem = ReadDataFile("tokens/sts-rsa.crt");
   const std::string xml = Token("bearer");
   ExpectNothingElse([&] { SsoClient::CreateSamlToken(xml, {Tarvel::Crypto::CreateCertificateFromPem(pem)}); });
+}
+
+/// Fails if a report that is returned is not the whole one.
+std::function<void()> Explanation(const std::string &file, const std::string &certificate) {
+  const SsoClient::TokenVerifier verifier(Tarvel::Crypto::LoadCertificates(DataPath("tokens/" + certificate + ".crt")));
+  const std::string xml = ReadDataFile(file);
+  const std::string whole = Testing::DescribeReport(verifier.Explain(xml));
+  return [xml, verifier, whole] {
+    if (Testing::DescribeReport(verifier.Explain(xml)) != whole) {
+      throw std::logic_error("another report");
+    }
+  };
+}
+
+TEST_F(OutOfMemory, NeverLosesPartOfAReport) {
+  const Testing::FixedEnvironment clock;
+  ExpectNothingElse(Explanation("tokens/holder-of-key.xml", "sts-rsa"));
+  ExpectNothingElse(Explanation("tokens/bearer.xml", "other"));
+  ExpectNothingElse(Explanation("tokens/ecdsa-p256-sha256.xml", "sts-ec256"));
+  ExpectNothingElse(Explanation("attacks/digest-resigned-first-bit.xml", "sts-rsa"));
+  ExpectNothingElse(Explanation("attacks/foreign-certificate.xml", "sts-rsa"));
 }
 
 TEST_F(OutOfMemory, IsReportedByCertificates) {

@@ -6,6 +6,7 @@
 #include "integration/secret_wiping/freed_memory.h"
 #include "integration/transport/service_stand_in.h"
 #include "support/identity.h"
+#include "support/recorded_events.h"
 #include "support/rendezvous.h"
 #include "support/service_stand_ins.h"
 #include "xml/xml_text.h"
@@ -125,6 +126,22 @@ TEST_P(FreedMemory, ContainsTheWipedRequestBeforeTheResponseIsRead) {
   service.AcquireToken("alice", password, spec);
   EXPECT_TRUE(wasFreed);
   EXPECT_EQ(watch.Found(), 0);
+}
+
+// An observer needs copies of the password, because its events must not contain it.
+TEST_P(FreedMemory, ContainsNoPasswordOfAnObservedOperation) {
+  const std::string password = GetParam();
+  const TokenSpec spec = Spec();
+  ServiceOptions options;
+  const auto observer = std::make_shared<Testing::RecordedEvents>();
+  options.observer = observer;
+  const SecurityTokenServiceImpl service(
+      std::make_shared<const RequestBuilderImpl>(boost::none), std::make_shared<const ForgetfulTransport>(),
+      std::make_shared<const Testing::ResponseHandlerStandIn>(), Tarvel::Crypto::CertificateList(), options);
+  const Testing::FreedMemoryWatch watch(GetParam());
+  service.AcquireToken("alice", password, spec);
+  EXPECT_EQ(watch.Found(), 0);
+  EXPECT_EQ(observer->Lines().back(), "ended");
 }
 
 TEST_P(FreedMemory, ContainsNoTextThatWasKeptAsASecret) {

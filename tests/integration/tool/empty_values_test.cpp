@@ -17,7 +17,7 @@ namespace {
 
 using testing::IsSupersetOf;
 
-const char *const COMMANDS[] = {"acquire", "renew", "validate", "verify", "inspect"};
+const char *const COMMANDS[] = {"acquire", "renew", "validate", "verify", "inspect", "doctor"};
 
 class EmptyValue : public testing::TestWithParam<const char *> {};
 
@@ -45,7 +45,7 @@ TEST(EmptyValue, IsTestedForTheOptionsThatTakeAnArgument) {
                                      "--token",         "--service",  "--ccache",        "--client-keytab",
                                      "--cert",          "--key",      "--p12",           "--passphrase-file",
                                      "--passphrase-fd", "--lifetime", "--audience",      "--delegate-to",
-                                     "--advice",        "--out",      "--format"}));
+                                     "--advice",        "--out",      "--format",        "--save-refused"}));
   for (const char *flag :
        {"--help", "--verbose", "--allow-http", "--gss", "--delegable", "--renewable", "--bearer", "--force"}) {
     EXPECT_EQ(0u, options.count(flag)) << flag;

@@ -4,6 +4,7 @@
 #include "closed_port.h"
 #include "expect_result.h"
 #include "process.h"
+#include "refusals.h"
 #include "support/work_folder.h"
 
 #include <gtest/gtest.h>
@@ -184,6 +185,10 @@ const Refusal REFUSALS[] = {
      "missing/token.xml: No such file or directory"},
 };
 
+const char *HintFor(const Refusal &refusal) {
+  return IsAboutToken(refusal.exceptionClass) ? EXPLAIN_HINT : "";
+}
+
 class ServiceRefusal : public testing::TestWithParam<Refusal> {
 protected:
   // Without a terminal: a run that is accepted by mistake must not prompt at the terminal of the tests.
@@ -192,9 +197,9 @@ protected:
   }
 };
 
-TEST_P(ServiceRefusal, IsOneLineOfTextAndAnExitCode) {
+TEST_P(ServiceRefusal, IsALineOfTextAndAnExitCodeAndAHintIfItIsAboutTheToken) {
   ExpectResult(Run(""), GetParam().exitCode, "",
-               std::string("ssoclient: ") + GetParam().label + ": " + GetParam().message + "\n");
+               RefusalText(GetParam().label, GetParam().message, HintFor(GetParam())));
 }
 
 TEST_P(ServiceRefusal, IsOneJsonObjectAndTheSameExitCode) {
@@ -203,8 +208,7 @@ TEST_P(ServiceRefusal, IsOneJsonObjectAndTheSameExitCode) {
     message.insert(quote, "\\");
   }
   ExpectResult(Run(" --format json"), GetParam().exitCode, "",
-               std::string(R"({"schema":1,"error":{"class":")") + GetParam().exceptionClass + R"(","message":")" +
-                   message + "\"}}\n");
+               RefusalJson(GetParam().exceptionClass, message, HintFor(GetParam())));
 }
 
 INSTANTIATE_TEST_SUITE_P(Of, ServiceRefusal, testing::ValuesIn(REFUSALS),

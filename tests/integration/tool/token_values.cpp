@@ -2,6 +2,8 @@
 
 #include "token_values.h"
 
+#include <iterator>
+#include <regex>
 #include <stdexcept>
 
 namespace ToolTest {
@@ -31,6 +33,16 @@ std::string FillFrom(const std::string &xml, std::string text) {
   const std::string conditions = xml.substr(xml.find("Conditions "));
   text = Fill(text, "@NOT_BEFORE@", AttributeIn(conditions, "NotBefore"));
   return Fill(text, "@NOT_ON_OR_AFTER@", AttributeIn(conditions, "NotOnOrAfter"));
+}
+
+std::string WithoutDistances(const std::string &text) {
+  static const std::regex DISTANCE(
+      R"(\n(Not before:      |Not on or after: )([^ \n]+) \((now|in [0-9a-z ]+|[0-9a-z ]+ ago)\))");
+  const auto count = std::distance(std::sregex_iterator(text.begin(), text.end(), DISTANCE), std::sregex_iterator());
+  if (count != 2) {
+    throw std::runtime_error("not two times with a distance in " + text);
+  }
+  return std::regex_replace(text, DISTANCE, "\n$1$2");
 }
 
 } // namespace ToolTest

@@ -18,4 +18,8 @@ std::string Fill(std::string text, const std::string &mark, const std::string &v
 /// the element Conditions; the confirmation of a bearer token has another NotOnOrAfter.
 std::string FillFrom(const std::string &xml, std::string text);
 
+/// `text` without the distances after its two times of validity, such as " (in 7 h 59 min)".
+/// @throws std::runtime_error when one of the two is missing.
+std::string WithoutDistances(const std::string &text);
+
 } // namespace ToolTest

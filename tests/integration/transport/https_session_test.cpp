@@ -134,6 +134,52 @@ TEST(HttpsSession, ReportsCodeAndReasonOfEveryOtherStatus) {
   }
 }
 
+/// The facts that a session notes of a response, as text. The outcome does not matter.
+std::string FactsOf(const std::string &response) {
+  ServiceStandIn service(AnswerWith(response));
+  Request request = SampleRequest();
+  request.facts = std::make_shared<ResponseFacts>();
+  AskForOutcome(*service.CreateSession(), request);
+  return std::to_string(request.facts->status) + " " + request.facts->reason + ", " + request.facts->contentType +
+         ", " + std::to_string(request.facts->octets);
+}
+
+TEST(HttpsSession, NotesTheFactsOfAResponse) {
+  EXPECT_EQ(FactsOf(Response("200 Fine", "<body/>", "content-type: text/xml; charset=utf-8\r\n")),
+            "200 Fine, text/xml; charset=utf-8, 7");
+  EXPECT_EQ(FactsOf(Response("500 Internal Server Error", "<fault/>")), "500 Internal Server Error, , 8");
+  EXPECT_EQ(FactsOf("HTTP/1.1 200 OK\r\nTransfer-Encoding: chunked\r\n\r\n3\r\nabc\r\n2\r\nde\r\n0\r\n\r\n"),
+            "200 OK, , 5");
+  // The length is that of the body as it was received; as UTF-8 this one is longer.
+  EXPECT_EQ(FactsOf(Response("200 OK", "\xFC\xFC", "Content-Type: text/xml;charset=latin1\r\n")),
+            "200 OK, text/xml;charset=latin1, 2");
+}
+
+TEST(HttpsSession, NotesTheFactsOfAnErrorStatus) {
+  EXPECT_EQ(FactsOf(Response("503 Busy", "<html/>", "Content-Type: text/html\r\n")), "503 Busy, text/html, 0");
+}
+
+TEST(HttpsSession, NotesNothingWithoutResponse) {
+  EXPECT_EQ(FactsOf("garbage"), "0 , , 0");
+  EXPECT_EQ(FactsOf("HTTP/1.1 200 OK\r\nContent-Length: 100\r\n\r\nshort"), "0 , , 0");
+}
+
+TEST(HttpsSession, NotesTheFactsBeforeTheCompletionOfAnAsynchronousRequest) {
+  ServiceStandIn service(AnswerWith(Response("503 Busy", "", "Content-Type: text/html\r\n")));
+  Request request = SampleRequest();
+  request.facts = std::make_shared<ResponseFacts>();
+  std::promise<int> status;
+  Ref<Tarvel::System::ScheduledItem> item;
+  const auto session = service.CreateSession();
+  session->SendRequestAsync(
+      request,
+      [&, facts = request.facts](const Tarvel::Exception *, Tarvel::Reader *) { status.set_value(facts->status); },
+      item);
+  EXPECT_EQ(status.get_future().get(), 503);
+  EXPECT_EQ(request.facts->reason, "Busy");
+  EXPECT_EQ(request.facts->contentType, "text/html");
+}
+
 const char LATIN1[] = "Content-Type: text/xml; charset=\"ISO-8859-1\"\r\n";
 const char DECLARATION[] = "<?xml version=\"1.0\" encoding=\"ISO-8859-1\"?>";
 

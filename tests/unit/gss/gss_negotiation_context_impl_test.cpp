@@ -3,6 +3,7 @@
 #include "gss/gss_negotiation_context_impl.h"
 
 #include "support/data_file.h"
+#include "support/recorded_events.h"
 #include "support/recorded_log.h"
 #include "support/service_stand_ins.h"
 #include "support/throws_message.h"
@@ -29,13 +30,13 @@ std::string Token(const std::string &name) {
 /// A context whose service answers each leg with the next of the given responses.
 class GssNegotiation {
 public:
-  explicit GssNegotiation(Texts answers)
+  explicit GssNegotiation(Texts answers, const ServiceOptions &options = {})
       : m_transport(std::make_shared<Testing::TransportStandIn>(
             [answers, next = std::make_shared<std::size_t>(0)](const Request &) { return answers.at((*next)++); })),
         m_context(std::make_shared<GssNegotiationContextImpl>(
             Testing::SpecFor(60), std::make_shared<const Testing::RequestBuilderStandIn>(),
             m_transport->CreateSession(), std::make_shared<const Testing::ResponseHandlerStandIn>(),
-            Testing::TrustedCertificates())) {}
+            Testing::TrustedCertificates(), options)) {}
 
   GssNegotiationResult Negotiate(const std::string &leg) const { return m_context->NegotiateToken(ToBytes(leg)); }
   Texts Sent() const { return m_transport->Sent(); }
@@ -117,6 +118,54 @@ TEST(GssNegotiationContext, WritesNoLogLine) {
   const Testing::RecordedLog log;
   GssNegotiation({"leg:ctx|final|" + Token("bearer")}).Negotiate("c1");
   EXPECT_EQ(log.Lines(), Texts{});
+}
+
+TEST(GssNegotiationContext, ReportsEachLegAsOneOperation) {
+  const auto observer = std::make_shared<Testing::RecordedEvents>();
+  ServiceOptions options;
+  options.observer = observer;
+  const GssNegotiation negotiation({"leg:ctx|s1|", "fault:busy", "leg:ctx|s2|" + Token("bearer")}, options);
+  negotiation.Negotiate("c1");
+  EXPECT_THROWS_MESSAGE(negotiation.Negotiate("c2"), InvalidCredentialsException, "busy");
+  negotiation.Negotiate("c2");
+  EXPECT_EQ(observer->Lines(),
+            (Texts{"started NegotiateToken", "sent urn:action, leg 1", "received 200 OK, text/xml, leg 1", "ended",
+                   "started NegotiateToken", "sent urn:action, leg 2", "received 200 OK, text/xml, leg 2",
+                   "ended InvalidCredentialsException: busy", //
+                   "started NegotiateToken", "sent urn:action, leg 2", "received 200 OK, text/xml, leg 2", "ended"}));
+  EXPECT_EQ(observer->LinesById().size(), 3u);
+}
+
+TEST(GssNegotiationContext, MasksALegThatTheServiceRepeats) {
+  const auto observer = std::make_shared<Testing::RecordedEvents>();
+  ServiceOptions options;
+  options.observer = observer;
+  const GssNegotiation negotiation({"fault:no Y2xpZW50LWxlZw=="}, options);
+  EXPECT_THROW(negotiation.Negotiate("client-leg"), InvalidCredentialsException);
+  EXPECT_EQ(observer->Lines().back(), "ended InvalidCredentialsException: no ***");
+}
+
+TEST(GssNegotiationContext, HandsARefusedTokenToTheSink) {
+  Texts refused;
+  ServiceOptions options;
+  options.refusedTokenSink = [&](const std::string &xml) { refused.push_back(xml); };
+  EXPECT_THROW(GssNegotiation({"leg:ctx||" + Token("expired")}, options).Negotiate("c1"), ParseException);
+  EXPECT_EQ(refused, Texts{Token("expired")});
+}
+
+TEST(GssNegotiationContext, LogsWhatTheSinkThrows) {
+  const Testing::RecordedLog log;
+  ServiceOptions options;
+  options.refusedTokenSink = [](const std::string &) { throw 7; };
+  EXPECT_THROWS_MESSAGE(GssNegotiation({"leg:ctx||" + Token("expired")}, options).Negotiate("c1"), ParseException,
+                        "The token has expired at: 2021-01-01T00:00:00.000Z");
+  EXPECT_EQ(log.Lines(), Texts{"SsoClient 8 The sink of refused tokens threw int"});
+}
+
+TEST(GssNegotiationContext, VerifiesTheTokenWithItsOptions) {
+  ServiceOptions options;
+  options.verifyOptions.clockToleranceSec = std::int64_t{100} * 365 * 24 * 3600;
+  EXPECT_NE(GssNegotiation({"leg:ctx||" + Token("expired")}, options).Negotiate("c1").token, nullptr);
 }
 
 TEST(GssNegotiationContext, CannotBeMadeWithoutTrustedCertificates) {

@@ -20,11 +20,11 @@ TEST(ResolveReferences, ResolvesEqualReferencesToTheSameNode) {
   const ElementNode *const root = document->GetDocumentElement();
   const Node *const x = root->GetFirstChild();
   EXPECT_EQ((std::vector<const Node *>{x, root, document->GetDocumentNode(), x, document->GetDocumentNode(), root}),
-            ResolveReferences(*root, {"#b", "#a", "", "#b", "", "#a"}));
+            ResolveReferences(*root, {{"#b"}, {"#a"}, {""}, {"#b"}, {""}, {"#a"}}));
 }
 
 /// The identifiers that are searched for, each with the index of the first reference to it.
-std::vector<std::pair<std::string_view, std::size_t>> SearchedFor(const std::vector<std::string_view> &uris) {
+std::vector<std::pair<std::string_view, std::size_t>> SearchedFor(const std::vector<ReferenceUri> &uris) {
   std::vector<std::pair<std::string_view, std::size_t>> searched;
   for (const IdentifierSearch &search : PlanSearches(uris)) {
     searched.emplace_back(search.identifier, search.reference);
@@ -34,9 +34,9 @@ std::vector<std::pair<std::string_view, std::size_t>> SearchedFor(const std::vec
 
 TEST(PlanSearches, SearchesOnceForARepeatedIdentifier) {
   using Searches = std::vector<std::pair<std::string_view, std::size_t>>;
-  EXPECT_EQ(SearchedFor(std::vector<std::string_view>(1000, "#a")), (Searches{{"a", 0}}));
-  EXPECT_EQ(SearchedFor({"", "#b", "#a", "#b", "", "#a"}), (Searches{{"b", 1}, {"a", 2}}));
-  EXPECT_EQ(SearchedFor({"", ""}), Searches{});
+  EXPECT_EQ(SearchedFor(std::vector<ReferenceUri>(1000, {"#a"})), (Searches{{"a", 0}}));
+  EXPECT_EQ(SearchedFor({{""}, {"#b"}, {"#a"}, {"#b"}, {""}, {"#a"}}), (Searches{{"b", 1}, {"a", 2}}));
+  EXPECT_EQ(SearchedFor({{""}, {""}}), Searches{});
 }
 
 } // namespace

@@ -115,6 +115,20 @@ TEST(Sign, MakesASignatureThatVerifiesInPlace) {
   EXPECT_EQ(std::set<std::string>{"#b"}, uris);
 }
 
+TEST(Explain, ShowsTheKeyThatMadeASignatureInPlace) {
+  const Ref<Document> document = ParseDocument(MESSAGE);
+  const Ref<Signature> signature = BlankSignatureOf(*document);
+  signature->AddReference("#b", Uri::DIGEST_SHA256, EXCLUSIVE);
+  const auto resolver = CreateTrustSetKeyResolver(Trusted({"sts-rsa"}));
+  EXPECT_THROWS_MESSAGE(signature->Explain(*resolver), Tarvel::InvalidStateException,
+                        "The signature has not been signed yet");
+  signature->Sign(*Key("sts-rsa"));
+  const Tarvel::Xml::Security::SignatureReport report = signature->Explain(*resolver);
+  EXPECT_TRUE(report.refusals.empty());
+  EXPECT_TRUE(report.keys.front().madeSignature);
+  EXPECT_EQ("e:Body", static_cast<const ElementNode *>(report.references.front().target)->GetName());
+}
+
 TEST(CreateBlankSignature, RefusesAlgorithmsThatAreNotSupported) {
   const Ref<Document> document = ParseDocument(MESSAGE);
   const Ref<ElementNode> root(document->GetDocumentElement());

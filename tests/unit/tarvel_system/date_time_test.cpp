@@ -32,10 +32,16 @@ std::int64_t UtcOf(std::string_view text) {
 }
 
 std::string RefusalOf(std::string_view text) {
+  DateTime tried("2001-01-01T00:00:00+01:00");
+  const bool isAccepted = DateTime::TryParse(text, tried);
   try {
     const DateTime value(text);
+    EXPECT_TRUE(isAccepted) << text;
+    EXPECT_EQ(value.ToString(), tried.ToString());
     return "accepted as " + value.ToString();
   } catch (const DateTimeFormatException &error) {
+    EXPECT_FALSE(isAccepted) << text;
+    EXPECT_EQ("2001-01-01T00:00:00.000+01:00", tried.ToString());
     return error.what();
   }
 }
@@ -237,6 +243,14 @@ TEST(DateTime, RefusesEveryPrefixThatIsNotADateTime) {
     const bool endsInFraction = length >= 21 && length <= 26;
     EXPECT_EQ(RefusalOf(text.substr(0, length)).starts_with("accepted"), endsAfterSeconds || endsInFraction) << length;
   }
+}
+
+TEST(DateTimeTryParse, ReturnsWhetherItReadADateTime) {
+  DateTime date;
+  EXPECT_TRUE(DateTime::TryParse("2013-05-07T11:03:01.042+02:00", date));
+  EXPECT_EQ("2013-05-07T11:03:01.042+02:00", date.ToString());
+  EXPECT_FALSE(DateTime::TryParse("tomorrow", date));
+  EXPECT_EQ("2013-05-07T11:03:01.042+02:00", date.ToString());
 }
 
 TEST(DateTime, RepeatsAtMost1024BytesOfARefusedText) {

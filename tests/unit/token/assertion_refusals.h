@@ -5,6 +5,7 @@
 #pragma once
 
 #include "support/parsed_document.h"
+#include "support/recorded_deviations.h"
 #include "support/throws_message.h"
 #include "token/assertion_parser.h"
 #include "unit/token/assertion_text.h"
@@ -32,13 +33,26 @@ inline void Parse(const std::string &text) {
   SsoClient::ParseSamlAssertionElement(iterator, assertion);
 }
 
-/// Expects that `base` is accepted, and that it is refused after each of the changes.
+/// The text of the first deviation that a parse reports if it goes on.
+inline std::string FirstDeviation(const std::string &text) {
+  const ParsedDocument document(text);
+  SsoClient::NodeFilterIterator iterator = document.Cursor();
+  SsoClient::SamlAssertionType assertion;
+  RecordedDeviations deviations;
+  SsoClient::ParseSamlAssertionElement(iterator, assertion, deviations);
+  return deviations.all.empty() ? std::string() : deviations.all.front().message;
+}
+
+/// Expects that `base` is accepted, and that it is refused after each of the changes, with the first deviation that a report
+/// would list.
 inline void ExpectRefusals(const std::string &base, const std::vector<Refusal> &refusals) {
   ASSERT_NO_THROW(Parse(base));
+  EXPECT_EQ("", FirstDeviation(base));
   for (const Refusal &refusal : refusals) {
     SCOPED_TRACE("replaced " + refusal.from + "\nby " + refusal.to);
-    EXPECT_THROWS_MESSAGE(Parse(ReplaceOnce(base, refusal.from, refusal.to)), SsoClient::ParseException,
-                          refusal.message);
+    const std::string changed = ReplaceOnce(base, refusal.from, refusal.to);
+    EXPECT_THROWS_MESSAGE(Parse(changed), SsoClient::ParseException, refusal.message);
+    EXPECT_EQ(refusal.message, FirstDeviation(changed));
   }
 }
 

@@ -2,6 +2,7 @@
 
 #include "token/token_checks.h"
 
+#include "support/recorded_deviations.h"
 #include "support/throws_message.h"
 
 #include <ssoclient/exceptions.h>
@@ -12,6 +13,7 @@
 #include <cstdint>
 #include <limits>
 #include <string>
+#include <vector>
 
 namespace {
 
@@ -285,6 +287,71 @@ TEST_F(CheckTokenPropertiesTest, ReadsTheClockOnlyAfterItHasCheckedVersionIdAndO
   assertion.Version = "";
   EXPECT_THROWS_MESSAGE(Check(assertion), ParseException, "Invalid token version");
   EXPECT_EQ(0, looks);
+}
+
+TEST_F(CheckTokenPropertiesTest, ReportsEveryRuleThatFailsToASinkThatGoesOn) {
+  SamlAssertionType assertion = WithDelegation(ValidBetween(3601, -3601), BACKUP, {});
+  assertion.Subject.SubjectConfirmation.Method = SamlToken::BEARER;
+  assertion.Subject.SubjectConfirmation.SubjectConfirmationData.NotOnOrAfter = AtSecond(-3602);
+  Testing::RecordedDeviations sink;
+  CheckVersion(SamlAssertionType(), sink);
+  CheckId(SamlAssertionType(), sink);
+  EXPECT_EQ(AtSecond(0), CheckValidity(assertion.Conditions, TOLERANCE_SEC, sink));
+  CheckSubjectValidity(assertion, sink);
+  CheckDelegation(assertion, sink);
+  std::vector<std::string> messages;
+  for (const Deviation &deviation : sink.all) {
+    messages.push_back(deviation.message);
+  }
+  EXPECT_EQ((std::vector<std::string>{
+                "Invalid token version", "Invalid token ID",
+                "Unsatisfiable token validity conditions: NotBefore must be less than NotOnOrAfter.",
+                "Token start date is in the future: 2026-01-02T04:04:06.006Z",
+                "The token has expired at: 2026-01-02T02:04:04.006Z", "Invalid token subject validity",
+                "Token SubjectConfirmation contains delegate id, but no delegation restriction is present"}),
+            messages);
+}
+
+/// By how many seconds the clock misses a validity; 0 if it is within the validity.
+std::int64_t MissedBySec(const ConditionsType &conditions, std::int64_t clockToleranceSec) {
+  Testing::RecordedDeviations sink;
+  CheckValidity(conditions, clockToleranceSec, sink);
+  return sink.all.empty() ? 0 : sink.all.back().missedBySec;
+}
+
+// The smallest number of whole seconds after which the token would be accepted if the clock were set by so much.
+TEST_F(CheckTokenPropertiesTest, ReportsBySecondsHowFarTheClockIsFromTheToleratedValidity) {
+  const auto missed = [](std::int64_t from, std::int64_t to) {
+    return MissedBySec(ValidBetween(from, to).Conditions, TOLERANCE_SEC);
+  };
+  EXPECT_EQ(0, missed(600, 3600));
+  EXPECT_EQ(1, missed(601, 3600));
+  EXPECT_EQ(3000, missed(3600, 7200));
+  EXPECT_EQ(0, missed(-3600, -599));
+  EXPECT_EQ(1, missed(-3600, -600));
+  EXPECT_EQ(2, missed(-3600, -601));
+  ConditionsType conditions = ValidBetween(600, 3600).Conditions;
+  conditions.NotBefore = conditions.NotBefore.PlusMicroseconds(1);
+  EXPECT_EQ(1, MissedBySec(conditions, TOLERANCE_SEC));
+  conditions.NotBefore = conditions.NotBefore.PlusMicroseconds(SECOND);
+  EXPECT_EQ(2, MissedBySec(conditions, TOLERANCE_SEC));
+}
+
+TEST_F(CheckTokenPropertiesTest, ReportsTheSecondsOfAToleranceThatIsLongerThanAllTime) {
+  Testing::RecordedDeviations sink;
+  CheckValidity(ValidBetween(-3600, 3600).Conditions, SMALLEST, sink);
+  ASSERT_EQ(2u, sink.all.size());
+  EXPECT_EQ(9223372033255, sink.all[0].missedBySec);
+  EXPECT_EQ(9223372033255, sink.all[1].missedBySec);
+}
+
+TEST(CheckAudience, JoinsTheAudiencesInTheirOrder) {
+  VerifyOptions options;
+  options.acceptedAudiences = {"urn:c"};
+  EXPECT_THROWS_MESSAGE(CheckAudience({"urn:b", "urn:a"}, options, nullptr, ThrowingSink()), ParseException,
+                        "The token is restricted to other audiences: urn:a, urn:b");
+  EXPECT_EQ("", JoinTexts({}));
+  EXPECT_EQ("urn:a", JoinTexts({"urn:a"}));
 }
 
 } // namespace

@@ -3,6 +3,7 @@
 #include "token/token_facts.h"
 
 #include "support/parsed_document.h"
+#include "support/recorded_deviations.h"
 #include "support/throws_message.h"
 #include "token/assertion_parser.h"
 #include "unit/token/assertion_text.h"
@@ -185,6 +186,59 @@ TEST(TakeTokenFacts, IsDelegableOnlyWithACountThatIsNotZero) {
   EXPECT_FALSE(isDelegable(ProxyRestrictionType{boost::none}));
   EXPECT_FALSE(isDelegable(ProxyRestrictionType{std::uint64_t{0}}));
   EXPECT_TRUE(isDelegable(ProxyRestrictionType{std::uint64_t{1}}));
+}
+
+TEST(TakeAttributes, LeavesOutWhatCannotBeReadAndReportsIt) {
+  SamlAssertionType assertion = Minimal();
+  assertion.AttributeStatement =
+      AttributeStatementType{{Attribute(GROUP_IDENTITY, {"corp\\a", "b", "corp\\c", "d"}),
+                              Attribute(IS_SOLUTION, {"true"}), Attribute(IS_SOLUTION, {"false", "false"})}};
+  Testing::RecordedDeviations sink;
+  TokenFacts facts;
+  TakeAttributes(assertion, facts, sink);
+  ASSERT_EQ(2u, facts.groups.size());
+  EXPECT_EQ("c", facts.groups[1].name);
+  EXPECT_TRUE(facts.solution);
+  ASSERT_EQ(3u, sink.all.size());
+  EXPECT_EQ("Failed to parse Group Identity value: `b'; domain or group missing", sink.all[0].message);
+  EXPECT_EQ("b", sink.all[0].found);
+  EXPECT_EQ("Failed to parse Group Identity value: `d'; domain or group missing", sink.all[1].message);
+  EXPECT_EQ("More than one value found for attribute isSolution.", sink.all[2].message);
+}
+
+TEST(TakeAttributes, MakesNoTextsForAFullSink) {
+  SamlAssertionType assertion = Minimal();
+  assertion.AttributeStatement = AttributeStatementType{{Attribute(GROUP_IDENTITY, {"a", "b", "c"})}};
+  Testing::RecordedDeviations sink(1);
+  TokenFacts facts;
+  TakeAttributes(assertion, facts, sink);
+  EXPECT_EQ(1u, sink.all.size());
+  EXPECT_EQ(2u, sink.unlisted);
+}
+
+TEST(TakeConditions, LeavesOutDelegatesThatCannotBeReadAndReportsThem) {
+  ConditionsType conditions;
+  conditions.DelegationRestriction = DelegationRestrictionType{
+      {{DateTime(), {UPN, "gateway@corp"}}, {DateTime(), {"urn:other", "x"}}, {DateTime(), {UPN, "backup@corp"}}}};
+  Testing::RecordedDeviations sink;
+  TokenFacts facts;
+  TakeConditions(conditions, facts, sink);
+  ASSERT_EQ(2u, facts.delegationChain.size());
+  EXPECT_EQ("backup", facts.delegationChain[1].subject.name);
+  ASSERT_EQ(1u, sink.all.size());
+  EXPECT_EQ("Invalid or unsupported NameId format 'urn:other'", sink.all[0].message);
+  EXPECT_EQ("Format", sink.all[0].attribute);
+}
+
+TEST(TakeSubject, KeepsNoNameThatCannotBeRead) {
+  SamlAssertionType assertion = Minimal();
+  assertion.Subject.NameID.value = "alice";
+  Testing::RecordedDeviations sink;
+  TokenFacts facts;
+  TakeSubject(assertion, facts, sink);
+  EXPECT_EQ(PrincipalId(), facts.subject);
+  EXPECT_EQ("_1", facts.id);
+  EXPECT_EQ(1u, sink.all.size());
 }
 
 } // namespace

@@ -79,6 +79,13 @@ TEST(FindUnmet, ListsNothingWhenNothingIsMissing) {
   EXPECT_THAT(FindUnmet(SpecWithEverything(), ASKED_AT, facts, 0), IsEmpty());
 }
 
+TEST(FindUnmet, ListsWhatTheTokenDoesNotSay) {
+  TokenSpec spec = SpecFor(60);
+  spec.renewable = true;
+  EXPECT_THAT(WantedOf(spec, TokenFacts()),
+              ElementsAre("a renewable token", "a lifetime of 60 seconds; the token ends at no known time"));
+}
+
 TEST(FindUnmet, AcceptsATokenWithMoreThanWasAskedFor) {
   TokenFacts facts = HourFrom("2026-01-01T12:00:00Z", "2026-01-02T12:00:00Z");
   facts.delegationChain = {{{"bob", "corp.example"}, DateTime()}};

@@ -104,4 +104,16 @@ TEST(NodeFilterIterator, StartsAtItsFirstNodeEvenIfTheFilterHidesIt) {
   EXPECT_EQ(document.Root().GetFirstChild(), iterator.node);
 }
 
+TEST(NodeFilterIterator, HasTheParentAlsoPastTheEnd) {
+  const ParsedDocument document("<r><e/></r>");
+  NodeFilterIterator iterator = document.Cursor();
+  EXPECT_EQ(document.Root().GetParent(), iterator.parent);
+  iterator.MoveToChild();
+  EXPECT_EQ(&document.Root(), iterator.parent);
+  EXPECT_EQ(&document.Child("e"), iterator.GetChild().parent);
+  iterator.MoveToSibling();
+  EXPECT_EQ(nullptr, iterator.node);
+  EXPECT_EQ(&document.Root(), iterator.parent);
+}
+
 } // namespace

@@ -5,6 +5,7 @@
 #pragma once
 
 #include <ssoclient/gssapi/export.h>
+#include <ssoclient/gssapi/negotiation_observer.h>
 #include <ssoclient/negotiation_handler.h>
 
 #include <cstdint>
@@ -36,6 +37,8 @@ struct SpnegoSettings {
   /// The maximum time in seconds from the start of the first leg to the end of the last one, including the time that
   /// the service takes. It is checked before and after each leg; nothing is interrupted.
   std::int64_t timeLimitSec = 60;
+  /// Follows the legs; null for none. Shared until the handler is destroyed.
+  std::shared_ptr<NegotiationObserver> observer;
 };
 
 /// The client's side of one negotiation; another negotiation needs another handler. Mutual authentication is requested,

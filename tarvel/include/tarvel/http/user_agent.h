@@ -59,6 +59,8 @@ public:
   virtual const std::string &GetReasonPhrase() const noexcept = 0;
   /// The value of a header, the first of that name in any letter case; false when there is none.
   virtual bool GetHeader(std::string_view name, std::string &value) const = 0;
+  /// The number of octets of the body as it was received, without those of the transfer coding.
+  virtual std::size_t GetBodyLength() const noexcept = 0;
 
 protected:
   ~ClientResponse() override;

@@ -35,6 +35,10 @@ public:
   /// @throws DateTimeFormatException when the text has another form or a field is out of range.
   explicit DateTime(std::string_view text);
 
+  /// The same without an exception, for programs that read many texts that may have another form.
+  /// @return whether `text` is a date-time; `date` is set only then.
+  static bool TryParse(std::string_view text, DateTime &date) noexcept;
+
   /// `time`, shown in UTC: rounded down to a microsecond, and outside the years 1 to 9999 the nearest point inside.
   /// `Duration` is any `std::chrono::duration`; a floating-point "not a number" becomes the start of year 1.
   template <typename Duration>

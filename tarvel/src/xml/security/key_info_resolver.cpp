@@ -2,8 +2,9 @@
 
 #include <tarvel/xml/security/key_info_resolver.h>
 
+#include "xml/security/key_info_certificates.h"
+
 #include <tarvel/core/string_util.h>
-#include <tarvel/xml/security/signature.h>
 
 #include <algorithm>
 #include <string>
@@ -12,8 +13,6 @@
 namespace Tarvel::Xml::Security {
 
 namespace {
-
-constexpr std::size_t MAX_KEY_INFO_CERTIFICATES = 16; // further ones are not compared
 
 /// `text` without white space; empty if more than `most` characters remain, so that a long text takes little memory.
 std::string WithoutWhiteSpace(std::string_view text, std::size_t most) {
@@ -28,46 +27,6 @@ std::string WithoutWhiteSpace(std::string_view text, std::size_t most) {
     compact += character;
   }
   return compact;
-}
-
-/// The texts of the certificates in a `ds:KeyInfo`, at most `MAX_KEY_INFO_CERTIFICATES`.
-std::vector<std::string_view> CertificateTexts(const ElementNode &keyInfo) {
-  std::vector<std::string_view> texts;
-  for (const Node *data = keyInfo.GetFirstChild(); data; data = data->GetNextSibling()) {
-    const ElementNode *x509Data = AsElement(data);
-    if (!x509Data || !x509Data->HasQName(SignatureUri::NAMESPACE, "X509Data")) {
-      continue;
-    }
-    for (const Node *child = x509Data->GetFirstChild(); child; child = child->GetNextSibling()) {
-      const ElementNode *element = AsElement(child);
-      if (!element || !element->HasQName(SignatureUri::NAMESPACE, "X509Certificate")) {
-        continue;
-      }
-      const TextNode *text = AsText(element->GetFirstChild());
-      if (text && !text->GetNextSibling()) {
-        texts.push_back(text->GetValue());
-      }
-      if (texts.size() == MAX_KEY_INFO_CERTIFICATES) {
-        return texts;
-      }
-    }
-  }
-  return texts;
-}
-
-/// The certificates in their order, without nulls and duplicates.
-KeyInfoResolver::CertificateList DistinctCertificates(const KeyInfoResolver::CertificateList &certificates) {
-  KeyInfoResolver::CertificateList distinct;
-  distinct.reserve(certificates.size());
-  for (const Ref<const Crypto::Certificate> &certificate : certificates) {
-    const bool isKnown = std::any_of(distinct.begin(), distinct.end(), [&certificate](const auto &known) {
-      return !certificate || known->GetDer() == certificate->GetDer();
-    });
-    if (certificate && !isKnown) {
-      distinct.push_back(certificate);
-    }
-  }
-  return distinct;
 }
 
 class TrustSetKeyResolver final : public KeyInfoResolver {

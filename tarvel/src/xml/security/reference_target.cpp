@@ -3,9 +3,7 @@
 #include "xml/security/reference_target.h"
 
 #include <tarvel/core/string_util.h>
-#include <tarvel/xml/security/exceptions.h>
 
-#include <algorithm>
 #include <string>
 
 namespace Tarvel::Xml::Security {
@@ -15,22 +13,26 @@ namespace {
 constexpr std::string_view WSU_NAMESPACE =
     "http://docs.oasis-open.org/wss/2004/01/oasis-200401-wss-wssecurity-utility-1.0.xsd";
 
-[[noreturn]] void Refuse(std::string_view uri, const char *why) {
-  throw XmlSecurityException("The reference URI \"" + StringUtil::Shorten(uri) + "\" is not accepted: " + why);
+constexpr const char *WANTED_URI = "\"\", or \"#\" and an identifier";
+constexpr const char *WANTED_TARGET = "one element with that identifier";
+
+void Refuse(RefusalSink &sink, std::string_view uri, const char *why, const ElementNode *place, const char *wanted) {
+  SignatureReport::Refusal &refusal =
+      sink.Add(SignatureRule::REFERENCES,
+               "The reference URI \"" + StringUtil::Shorten(uri) + "\" is not accepted: " + why, place);
+  refusal.found = StringUtil::Shorten(uri);
+  refusal.wanted = wanted;
 }
 
-/// The identifier after the "#", which must be a bare name.
-std::string_view RequireIdentifier(std::string_view uri) {
+/// Why a URI is not "#" and a bare name; null if it is.
+const char *FaultOf(std::string_view uri) {
   if (uri.front() != '#') {
-    Refuse(uri, "it points outside the document");
+    return "it points outside the document";
   }
   if (uri.size() == 1) {
-    Refuse(uri, "it names nothing");
+    return "it names nothing";
   }
-  if (uri.find('(') != std::string_view::npos) {
-    Refuse(uri, "it is an XPointer");
-  }
-  return uri.substr(1);
+  return uri.find('(') != std::string_view::npos ? "it is an XPointer" : nullptr;
 }
 
 bool IsIdentifier(const Attribute &attribute, const ElementNode &element) {
@@ -64,19 +66,24 @@ const Node *NextInDocument(const Node *node, const Node *top) {
   return node == top ? nullptr : node->GetNextSibling();
 }
 
-/// The index of the first URI that equals the one at `index`.
-std::size_t FirstEqual(const std::vector<std::string_view> &uris, std::size_t index) {
-  return static_cast<std::size_t>(std::find(uris.begin(), uris.end(), uris[index]) - uris.begin());
+/// The index of the first reference whose URI equals the one at `index`.
+std::size_t FirstEqual(const std::vector<ReferenceUri> &uris, std::size_t index) {
+  std::size_t first = 0;
+  while (uris[first].uri != uris[index].uri) {
+    ++first;
+  }
+  return first;
 }
 
-void NoteMatches(const ElementNode &element, const std::vector<std::string_view> &uris,
-                 std::vector<IdentifierSearch> &searches) {
+void NoteMatches(const ElementNode &element, const std::vector<ReferenceUri> &uris,
+                 std::vector<IdentifierSearch> &searches, RefusalSink &sink) {
   for (IdentifierSearch &search : searches) {
-    if (!HasIdentifier(element, search.identifier)) {
+    if (search.isAmbiguous || !HasIdentifier(element, search.identifier)) {
       continue;
     }
     if (search.target) {
-      Refuse(uris[search.reference], "several elements have that identifier");
+      search.isAmbiguous = true;
+      Refuse(sink, uris[search.reference].uri, "several elements have that identifier", &element, WANTED_TARGET);
     }
     search.target = &element;
   }
@@ -84,35 +91,43 @@ void NoteMatches(const ElementNode &element, const std::vector<std::string_view>
 
 } // namespace
 
-std::vector<IdentifierSearch> PlanSearches(const std::vector<std::string_view> &uris) {
+std::vector<IdentifierSearch> PlanSearches(const std::vector<ReferenceUri> &uris, RefusalSink &sink) {
   std::vector<IdentifierSearch> searches;
   for (std::size_t index = 0; index < uris.size(); ++index) {
-    if (!uris[index].empty() && FirstEqual(uris, index) == index) {
-      searches.push_back({RequireIdentifier(uris[index]), index});
+    const std::string_view uri = uris[index].uri;
+    if (uri.empty() || FirstEqual(uris, index) != index) {
+      continue;
     }
+    if (const char *const fault = FaultOf(uri)) {
+      Refuse(sink, uri, fault, uris[index].element, WANTED_URI);
+      continue;
+    }
+    searches.push_back({uri.substr(1), index});
   }
   return searches;
 }
 
-std::vector<const Node *> ResolveReferences(const ElementNode &root, const std::vector<std::string_view> &uris) {
+std::vector<const Node *> ResolveReferences(const ElementNode &root, const std::vector<ReferenceUri> &uris,
+                                            RefusalSink &sink) {
   const Node *top = root.GetRoot();
-  std::vector<IdentifierSearch> searches = PlanSearches(uris);
+  std::vector<IdentifierSearch> searches = PlanSearches(uris, sink);
   if (!searches.empty()) {
     for (const Node *node = top; node; node = NextInDocument(node, top)) {
       if (const ElementNode *element = AsElement(node)) {
-        NoteMatches(*element, uris, searches);
+        NoteMatches(*element, uris, searches, sink);
       }
     }
   }
-  std::vector<const Node *> targets(uris.size(), top);
+  std::vector<const Node *> targets(uris.size(), nullptr);
   for (const IdentifierSearch &search : searches) {
     if (!search.target) {
-      Refuse(uris[search.reference], "no element has that identifier");
+      const ReferenceUri &reference = uris[search.reference];
+      Refuse(sink, reference.uri, "no element has that identifier", reference.element, WANTED_TARGET);
     }
-    targets[search.reference] = search.target;
+    targets[search.reference] = search.isAmbiguous ? nullptr : search.target;
   }
   for (std::size_t index = 0; index < uris.size(); ++index) {
-    targets[index] = targets[FirstEqual(uris, index)];
+    targets[index] = uris[index].uri.empty() ? top : targets[FirstEqual(uris, index)];
   }
   return targets;
 }

@@ -143,9 +143,9 @@ Ref<ElementNode> BlankSignature::GetElement() const {
 }
 
 const ElementNode &BlankSignature::AppendSignedInfo(ElementNode &signature) const {
-  std::vector<std::string_view> uris;
+  std::vector<ReferenceUri> uris;
   for (const Reference &reference : m_references) {
-    uris.push_back(reference.uri);
+    uris.push_back({reference.uri});
   }
   const std::vector<const Node *> targets = ResolveReferences(*m_root, uris);
   ElementNode &signedInfo = *signature.AppendElement(m_prefix, "SignedInfo");

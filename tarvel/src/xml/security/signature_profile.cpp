@@ -17,8 +17,8 @@ namespace {
 
 using Crypto::DigestAlgorithm;
 using Crypto::SignatureScheme;
+using Refusal = SignatureReport::Refusal;
 
-constexpr std::size_t MAX_REFERENCES = 10;
 constexpr std::size_t MAX_TRANSFORMS = 2; // of one reference
 constexpr std::size_t MAX_INCLUSIVE_PREFIXES = 256;
 
@@ -52,32 +52,87 @@ constexpr NamedDigestAlgorithm DIGEST_ALGORITHMS[] = {
     {SignatureUri::DIGEST_SHA512, DigestAlgorithm::SHA512},
 };
 
-[[noreturn]] void RefuseAlgorithm(const char *kind, std::string_view uri) {
-  throw XmlSecurityException(std::string("The ") + kind + " algorithm \"" + StringUtil::Shorten(uri) +
-                             "\" is not accepted");
+constexpr std::string_view CANONICALIZATION_URIS[] = {
+    CanonicalizationUri::INCLUSIVE,
+    CanonicalizationUri::INCLUSIVE_WITH_COMMENTS,
+    CanonicalizationUri::EXCLUSIVE,
+    CanonicalizationUri::EXCLUSIVE_WITH_COMMENTS,
+};
+
+std::string_view UriOf(std::string_view uri) {
+  return uri;
 }
 
-[[noreturn]] void RefuseParameter(std::string_view parameter, std::string_view uri) {
-  throw XmlSecurityException("The parameter \"" + StringUtil::Shorten(parameter) + "\" of the algorithm \"" +
-                             StringUtil::Shorten(uri) + "\" is not accepted");
+template <typename NamedAlgorithm>
+std::string_view UriOf(const NamedAlgorithm &named) {
+  return named.uri;
 }
 
-void RequireNoParameters(const AlgorithmSyntax &syntax) {
-  if (!syntax.otherParameter.empty()) {
-    RefuseParameter(syntax.otherParameter, syntax.uri);
+/// The URIs of a table, for a report.
+template <typename Table>
+std::string ListUris(const Table &table) {
+  std::string list;
+  for (const auto &entry : table) {
+    list.append(list.empty() ? "" : ", ").append(UriOf(entry));
   }
-  if (syntax.prefixList) {
-    RefuseParameter("InclusiveNamespaces", syntax.uri);
+  return list;
+}
+
+Refusal &Refuse(RefusalSink &sink, const std::string &message, const ElementNode *element, std::string_view found) {
+  Refusal &refusal = sink.Add(SignatureRule::PROFILE, message, element);
+  refusal.found = StringUtil::Shorten(found);
+  return refusal;
+}
+
+Refusal &RefuseAlgorithm(RefusalSink &sink, const char *kind, const AlgorithmSyntax &syntax) {
+  return Refuse(sink,
+                std::string("The ") + kind + " algorithm \"" + StringUtil::Shorten(syntax.uri) + "\" is not accepted",
+                syntax.element, syntax.uri);
+}
+
+void RefuseParameter(RefusalSink &sink, const AlgorithmSyntax &syntax, std::string_view parameter) {
+  Refuse(sink,
+         "The parameter \"" + StringUtil::Shorten(parameter) + "\" of the algorithm \"" +
+             StringUtil::Shorten(syntax.uri) + "\" is not accepted",
+         syntax.element, parameter)
+      .wanted = "no such parameter";
+}
+
+// The following functions return whether `sink` received nothing from them, or the algorithm only then.
+
+bool RequireNoOtherParameter(const AlgorithmSyntax &syntax, RefusalSink &sink) {
+  if (syntax.otherParameter.empty()) {
+    return true;
   }
+  RefuseParameter(sink, syntax, syntax.otherParameter);
+  return false;
+}
+
+bool RequireNoPrefixList(const AlgorithmSyntax &syntax, RefusalSink &sink) {
+  if (!syntax.prefixList) {
+    return true;
+  }
+  RefuseParameter(sink, syntax, "InclusiveNamespaces");
+  return false;
+}
+
+bool RequireNoParameters(const AlgorithmSyntax &syntax, RefusalSink &sink) {
+  const bool hasNoOther = RequireNoOtherParameter(syntax, sink);
+  return RequireNoPrefixList(syntax, sink) && hasNoOther;
 }
 
 /// The prefixes of a list separated by white space. A list of too many is refused before all of them are stored.
-std::vector<std::string> RequirePrefixes(std::string_view list, std::string_view uri) {
+std::optional<std::vector<std::string>> RequirePrefixes(const AlgorithmSyntax &syntax, RefusalSink &sink) {
+  const std::string_view list = *syntax.prefixList;
   std::vector<std::string> prefixes;
   for (std::size_t begin = list.find_first_not_of(WHITE_SPACE); begin != std::string_view::npos;) {
     if (prefixes.size() == MAX_INCLUSIVE_PREFIXES) {
-      throw XmlSecurityException("The PrefixList of the algorithm \"" + StringUtil::Shorten(uri) + "\" has more than " +
-                                 std::to_string(MAX_INCLUSIVE_PREFIXES) + " prefixes");
+      const std::string most = std::to_string(MAX_INCLUSIVE_PREFIXES) + " prefixes";
+      Refusal &refusal = Refuse(
+          sink, "The PrefixList of the algorithm \"" + StringUtil::Shorten(syntax.uri) + "\" has more than " + most,
+          syntax.element, list);
+      refusal.wanted = "at most " + most;
+      return std::nullopt;
     }
     const std::size_t end = std::min(list.find_first_of(WHITE_SPACE, begin), list.size());
     prefixes.emplace_back(list.substr(begin, end - begin));
@@ -86,72 +141,131 @@ std::vector<std::string> RequirePrefixes(std::string_view list, std::string_view
   return prefixes;
 }
 
-CanonicalizationMethod RequireCanonicalMethod(const char *kind, const AlgorithmSyntax &syntax) {
+bool SetParameters(CanonicalizationMethod &method, const AlgorithmSyntax &syntax, RefusalSink &sink) {
+  if (!method.isExclusive) {
+    return RequireNoParameters(syntax, sink);
+  }
+  const bool hasNoOther = RequireNoOtherParameter(syntax, sink);
+  if (!syntax.prefixList) {
+    return hasNoOther;
+  }
+  std::optional<std::vector<std::string>> prefixes = RequirePrefixes(syntax, sink);
+  if (!prefixes) {
+    return false;
+  }
+  SetInclusivePrefixes(method, *std::move(prefixes));
+  return hasNoOther;
+}
+
+std::optional<CanonicalizationMethod> RequireCanonicalizationMethod(const AlgorithmSyntax &syntax, RefusalSink &sink) {
   CanonicalizationMethod method;
   if (!FindCanonicalizationMethod(syntax.uri, method)) {
-    RefuseAlgorithm(kind, syntax.uri);
+    Refusal &refusal = RefuseAlgorithm(sink, "canonicalization", syntax);
+    refusal.wanted = ListUris(CANONICALIZATION_URIS);
+    return std::nullopt;
   }
-  if (!method.isExclusive || !syntax.otherParameter.empty()) {
-    RequireNoParameters(syntax);
-  }
-  if (syntax.prefixList) {
-    SetInclusivePrefixes(method, RequirePrefixes(*syntax.prefixList, syntax.uri));
-  }
-  return method;
+  return SetParameters(method, syntax, sink) ? std::optional(std::move(method)) : std::nullopt;
 }
 
-SignatureAlgorithm RequireSignatureAlgorithm(const AlgorithmSyntax &syntax) {
+std::optional<SignatureAlgorithm> RequireSignatureAlgorithm(const AlgorithmSyntax &syntax, RefusalSink &sink) {
   const std::optional<SignatureAlgorithm> algorithm = FindSignatureAlgorithm(syntax.uri);
   if (!algorithm) {
-    RefuseAlgorithm("signature", syntax.uri);
+    Refusal &refusal = RefuseAlgorithm(sink, "signature", syntax);
+    refusal.wanted = ListUris(SIGNATURE_ALGORITHMS);
+    return std::nullopt;
   }
-  RequireNoParameters(syntax);
-  return *algorithm;
+  return RequireNoParameters(syntax, sink) ? algorithm : std::nullopt;
 }
 
-DigestAlgorithm RequireDigestAlgorithm(const AlgorithmSyntax &syntax) {
+std::optional<DigestAlgorithm> RequireDigestAlgorithm(const AlgorithmSyntax &syntax, RefusalSink &sink) {
   const std::optional<DigestAlgorithm> algorithm = FindDigestAlgorithm(syntax.uri);
   if (!algorithm) {
-    RefuseAlgorithm("digest", syntax.uri);
+    Refusal &refusal = RefuseAlgorithm(sink, "digest", syntax);
+    refusal.wanted = ListUris(DIGEST_ALGORITHMS);
+    return std::nullopt;
   }
-  RequireNoParameters(syntax);
-  return *algorithm;
+  return RequireNoParameters(syntax, sink) ? algorithm : std::nullopt;
+}
+
+void RequireFewTransforms(const std::vector<AlgorithmSyntax> &transforms, ReferencePlan &plan, RefusalSink &sink) {
+  if (transforms.size() > MAX_TRANSFORMS) {
+    const std::string count = std::to_string(transforms.size()) + " transforms";
+    const std::string most = "at most " + std::to_string(MAX_TRANSFORMS);
+    Refuse(sink, "A reference has " + count + "; " + most + " are accepted", transforms[MAX_TRANSFORMS].element, count)
+        .wanted = most;
+    plan.isComputable = false;
+  }
+}
+
+/// Adds a transform that may follow those before it. @return whether it is a canonicalisation, which must be the last.
+bool PlanTransform(const AlgorithmSyntax &transform, ReferencePlan &plan, RefusalSink &sink) {
+  if (transform.uri == SignatureUri::ENVELOPED_SIGNATURE) {
+    plan.isComputable = RequireNoParameters(transform, sink) && plan.isComputable;
+    plan.omitsSignature = true;
+    return false;
+  }
+  if (!FindCanonicalizationMethod(transform.uri, plan.method)) {
+    Refusal &refusal = RefuseAlgorithm(sink, "transform", transform);
+    refusal.wanted = std::string(SignatureUri::ENVELOPED_SIGNATURE) + ", " + ListUris(CANONICALIZATION_URIS);
+    plan.isComputable = false;
+    return false;
+  }
+  plan.isComputable = SetParameters(plan.method, transform, sink) && plan.isComputable;
+  return true;
 }
 
 /// Accepts the enveloped-signature transform, then one canonicalisation, each at most once: a transform after the
 /// canonicalisation would have to parse octets again.
-void PlanTransforms(const std::vector<AlgorithmSyntax> &transforms, ReferencePlan &plan) {
-  if (transforms.size() > MAX_TRANSFORMS) {
-    throw XmlSecurityException("A reference has " + std::to_string(transforms.size()) + " transforms; at most " +
-                               std::to_string(MAX_TRANSFORMS) + " are accepted");
-  }
+void PlanTransforms(const std::vector<AlgorithmSyntax> &transforms, ReferencePlan &plan, RefusalSink &sink) {
+  RequireFewTransforms(transforms, plan, sink);
   bool isCanonical = false;
-  for (const AlgorithmSyntax &transform : transforms) {
-    const bool isEnveloped = transform.uri == SignatureUri::ENVELOPED_SIGNATURE;
-    if (isCanonical || (isEnveloped && plan.omitsSignature)) {
-      throw XmlSecurityException("The transform \"" + StringUtil::Shorten(transform.uri) +
-                                 "\" is not accepted after \"" + StringUtil::Shorten(transforms.front().uri) + "\"");
-    }
-    if (isEnveloped) {
-      RequireNoParameters(transform);
-      plan.omitsSignature = true;
+  for (std::size_t index = 0; index < std::min(transforms.size(), MAX_TRANSFORMS); ++index) {
+    const AlgorithmSyntax &transform = transforms[index];
+    const bool isSecondEnveloped = plan.omitsSignature && transform.uri == SignatureUri::ENVELOPED_SIGNATURE;
+    if (isCanonical || isSecondEnveloped) {
+      Refuse(sink,
+             "The transform \"" + StringUtil::Shorten(transform.uri) + "\" is not accepted after \"" +
+                 StringUtil::Shorten(transforms.front().uri) + "\"",
+             transform.element, transform.uri)
+          .wanted = "the enveloped-signature transform, then one canonicalization, each at most once";
+      plan.isComputable = false;
       continue;
     }
-    plan.method = RequireCanonicalMethod("transform", transform);
-    isCanonical = true;
+    isCanonical = PlanTransform(transform, plan, sink);
   }
 }
 
-ReferencePlan PlanReference(const ReferenceSyntax &syntax) {
+ReferencePlan PlanReference(const ReferenceSyntax &syntax, RefusalSink &sink) {
   if (syntax.type) {
-    throw XmlSecurityException("A reference of the type \"" + StringUtil::Shorten(*syntax.type) + "\" is not accepted");
+    Refuse(sink, "A reference of the type \"" + StringUtil::Shorten(*syntax.type) + "\" is not accepted",
+           syntax.element, *syntax.type)
+        .wanted = "no Type";
   }
   ReferencePlan plan;
-  PlanTransforms(syntax.transforms, plan);
+  PlanTransforms(syntax.transforms, plan, sink);
   // XML Signature, sections 4.4.3.2 and 4.4.3.3: "" and "#x" select a node set without comments, whatever the transforms.
   plan.method.withComments = false;
-  plan.digest = RequireDigestAlgorithm(syntax.digestMethod);
+  const std::optional<DigestAlgorithm> digest = RequireDigestAlgorithm(syntax.digestMethod, sink);
+  plan.digest = digest.value_or(plan.digest);
+  plan.isComputable = plan.isComputable && digest;
   return plan;
+}
+
+void RequireAcceptedParts(const SignatureSyntax &syntax, RefusalSink &sink) {
+  if (syntax.object) {
+    Refuse(sink, "A signature with ds:Object is not accepted", syntax.object, syntax.object->GetName()).wanted =
+        "no ds:Object";
+  }
+  if (syntax.references.empty()) {
+    Refuse(sink, "The signature has no reference", syntax.signedInfo, "").wanted = "a reference";
+  }
+  if (syntax.references.size() > MAX_REFERENCES) {
+    const std::string count = std::to_string(syntax.references.size()) + " references";
+    const std::string most = "at most " + std::to_string(MAX_REFERENCES);
+    Refuse(sink, "The signature has " + count + "; " + most + " are accepted",
+           syntax.references[MAX_REFERENCES].element, count)
+        .wanted = most;
+  }
 }
 
 } // namespace
@@ -174,23 +288,15 @@ std::optional<Crypto::DigestAlgorithm> FindDigestAlgorithm(std::string_view uri)
   return std::nullopt;
 }
 
-SignaturePlan RequireProfile(const SignatureSyntax &syntax) {
-  if (syntax.hasObject) {
-    throw XmlSecurityException("A signature with ds:Object is not accepted");
-  }
-  if (syntax.references.empty()) {
-    throw XmlSecurityException("The signature has no reference");
-  }
-  if (syntax.references.size() > MAX_REFERENCES) {
-    throw XmlSecurityException("The signature has " + std::to_string(syntax.references.size()) +
-                               " references; at most " + std::to_string(MAX_REFERENCES) + " are accepted");
-  }
-  SignaturePlan plan{RequireCanonicalMethod("canonicalization", syntax.canonicalizationMethod),
-                     RequireSignatureAlgorithm(syntax.signatureMethod),
-                     {}};
-  plan.references.reserve(syntax.references.size());
-  for (const ReferenceSyntax &reference : syntax.references) {
-    plan.references.push_back(PlanReference(reference));
+SignaturePlan RequireProfile(const SignatureSyntax &syntax, RefusalSink &sink) {
+  RequireAcceptedParts(syntax, sink);
+  SignaturePlan plan;
+  plan.signedInfoMethod = RequireCanonicalizationMethod(syntax.canonicalizationMethod, sink);
+  plan.algorithm = RequireSignatureAlgorithm(syntax.signatureMethod, sink);
+  const std::size_t examined = std::min(syntax.references.size(), MAX_REFERENCES);
+  plan.references.reserve(examined);
+  for (std::size_t index = 0; index < examined; ++index) {
+    plan.references.push_back(PlanReference(syntax.references[index], sink));
   }
   return plan;
 }

@@ -7,13 +7,18 @@
 #include "crypto/digest.h"
 #include "crypto/public_key.h"
 #include "xml/security/canonical_form.h"
+#include "xml/security/refusal_sink.h"
 #include "xml/security/signature_syntax.h"
 
+#include <cstddef>
 #include <optional>
 #include <string_view>
 #include <vector>
 
 namespace Tarvel::Xml::Security {
+
+/// Signatures with more references are refused, and the further references are not examined.
+constexpr std::size_t MAX_REFERENCES = 10;
 
 struct SignatureAlgorithm {
   Crypto::SignatureScheme scheme;
@@ -25,19 +30,21 @@ struct ReferencePlan {
   bool omitsSignature = false;   ///< the enveloped-signature transform
   CanonicalizationMethod method; ///< never with comments: same-document references leave them out
   Crypto::DigestAlgorithm digest = Crypto::DigestAlgorithm::SHA256;
+  bool isComputable = true; ///< no algorithm of it is refused
 };
 
+/// How a signature is verified. Algorithms that are refused are missing.
 struct SignaturePlan {
-  CanonicalizationMethod signedInfoMethod;
-  SignatureAlgorithm algorithm;
-  std::vector<ReferencePlan> references; ///< in the order of the syntax
+  std::optional<CanonicalizationMethod> signedInfoMethod;
+  std::optional<SignatureAlgorithm> algorithm;
+  std::vector<ReferencePlan> references; ///< in the order of the syntax, at most `MAX_REFERENCES`
 };
 
 std::optional<SignatureAlgorithm> FindSignatureAlgorithm(std::string_view uri);
 std::optional<Crypto::DigestAlgorithm> FindDigestAlgorithm(std::string_view uri);
 
-/// How to verify a signature that has this syntax.
-/// @throws XmlSecurityException naming what is outside the profile.
-SignaturePlan RequireProfile(const SignatureSyntax &syntax);
+/// How to verify a signature that has this syntax. `sink` receives what is outside the profile; if it throws, the result of a
+/// call that returns is complete.
+SignaturePlan RequireProfile(const SignatureSyntax &syntax, RefusalSink &sink);
 
 } // namespace Tarvel::Xml::Security

@@ -125,6 +125,7 @@ std::string_view ReadPrefixList(const ElementNode &element) {
 AlgorithmSyntax ReadAlgorithm(const ElementNode &element) {
   RequireAttributesAmong(element, {"Algorithm"});
   AlgorithmSyntax algorithm;
+  algorithm.element = &element;
   algorithm.uri = RequireAttribute(element, "Algorithm");
   for (ChildElements children(element); children.Current(); children.MoveOn()) {
     const ElementNode &child = *children.Current();
@@ -151,6 +152,7 @@ std::vector<AlgorithmSyntax> ReadTransforms(const ElementNode &element) {
 ReferenceSyntax ReadReference(const ElementNode &element) {
   RequireAttributesAmong(element, {"Id", "URI", "Type"});
   ReferenceSyntax reference;
+  reference.element = &element;
   reference.uri = RequireAttribute(element, "URI");
   if (const Attribute *type = element.FindAttribute(std::string_view(), "Type")) {
     reference.type = type->GetValue();
@@ -162,6 +164,7 @@ ReferenceSyntax ReadReference(const ElementNode &element) {
   reference.digestMethod = ReadAlgorithm(children.Take("DigestMethod"));
   const ElementNode &digestValue = children.Take("DigestValue");
   RequireAttributesAmong(digestValue, {});
+  reference.digestValueElement = &digestValue;
   reference.digestValue = ReadBase64(digestValue);
   children.RequireEnd();
   return reference;
@@ -191,10 +194,11 @@ SignatureSyntax ReadSignatureSyntax(const ElementNode &signature) {
   ReadSignedInfo(children.Take("SignedInfo"), syntax);
   const ElementNode &signatureValue = children.Take("SignatureValue");
   RequireAttributesAmong(signatureValue, {"Id"});
+  syntax.signatureValueElement = &signatureValue;
   syntax.signatureValue = ReadBase64(signatureValue);
   syntax.keyInfo = children.TakeIf("KeyInfo");
-  while (children.TakeIf("Object")) {
-    syntax.hasObject = true;
+  while (const ElementNode *object = children.TakeIf("Object")) {
+    syntax.object = syntax.object ? syntax.object : object;
   }
   children.RequireEnd();
   return syntax;

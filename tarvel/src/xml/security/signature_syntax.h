@@ -17,16 +17,19 @@ namespace Tarvel::Xml::Security {
 /// An element that specifies an algorithm: CanonicalizationMethod, SignatureMethod, DigestMethod or Transform. Views belong to
 /// the tree.
 struct AlgorithmSyntax {
+  const ElementNode *element = nullptr;
   std::string_view uri;
   std::optional<std::string_view> prefixList; ///< of an ec:InclusiveNamespaces, as written
   std::string_view otherParameter;            ///< name of the first other child element; empty if there is none
 };
 
 struct ReferenceSyntax {
+  const ElementNode *element = nullptr;
   std::string_view uri;
   std::optional<std::string_view> type;
   std::vector<AlgorithmSyntax> transforms;
   AlgorithmSyntax digestMethod;
+  const ElementNode *digestValueElement = nullptr;
   std::vector<std::uint8_t> digestValue;
 };
 
@@ -35,9 +38,10 @@ struct SignatureSyntax {
   AlgorithmSyntax canonicalizationMethod;
   AlgorithmSyntax signatureMethod;
   std::vector<ReferenceSyntax> references; ///< may be empty; then nothing is signed
+  const ElementNode *signatureValueElement = nullptr;
   std::vector<std::uint8_t> signatureValue;
   const ElementNode *keyInfo = nullptr; ///< may be null; its content is not checked
-  bool hasObject = false;
+  const ElementNode *object = nullptr;  ///< the first ds:Object, or null
 };
 
 /// Reads the syntax (XML Signature, section 4): elements of the ds namespace in their order, the attributes that they may

@@ -82,7 +82,8 @@ public:
   /// Checks what `Verify` checks, by the same rules, but goes on after a failure and reports everything. It computes the digests
   /// of at most ten references even if no trusted key made the signature, so use it where a person waits for the answer.
   /// @throws OutOfMemoryException, and InvalidStateException when OpenSSL has cleaned itself up, like `Verify`; also
-  ///         InvalidStateException for a blank signature before `Sign`. No content of the tree makes it throw.
+  ///         InvalidStateException for a blank signature before `Sign`. No content of the tree makes it throw, unless the element
+  ///         of a blank signature lost its syntax after `Sign`: then a SignatureSyntaxException, like `Verify`.
   virtual SignatureReport Explain(const KeyInfoResolver &resolver) const = 0;
 
 protected:

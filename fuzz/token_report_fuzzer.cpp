@@ -1,0 +1,63 @@
+// SPDX-License-Identifier: Apache-2.0
+/// @file
+/// Arbitrary bytes as a token, explained by different verifiers: the report says what a verification does with the bytes, it
+/// keeps all promises of token_report.h, and explaining throws nothing. The same for the tree of a well-formed text.
+
+#include "support/data_file.h"
+#include "support/judged_token.h"
+#include "xml/xml_text.h"
+
+#include <tarvel/core/environment.h>
+#include <tarvel/xml/document.h>
+#include <tarvel/xml/parser.h>
+
+#include <cstddef>
+#include <cstdint>
+#include <cstdio>
+#include <cstdlib>
+#include <string>
+#include <vector>
+
+namespace {
+
+using SsoClient::VerifyOptions;
+using Testing::JudgedVerifier;
+
+Tarvel::Ref<const Tarvel::Crypto::Certificate> Certificate(const std::string &name) {
+  return Tarvel::Crypto::LoadCertificates(Testing::DataPath("tokens/" + name + ".crt")).front();
+}
+
+std::vector<JudgedVerifier> MakeVerifiers() {
+  VerifyOptions demanding;
+  demanding.clockToleranceSec = 0;
+  demanding.acceptedAudiences = {"https://files.corp.example/"};
+  demanding.acceptUnrestrictedAudience = false;
+  demanding.requiredConfirmation = SsoClient::SamlToken::HOLDER_OF_KEY;
+  return {JudgedVerifier({Certificate("sts-rsa"), Certificate("sts-ec256")}, VerifyOptions()),
+          JudgedVerifier({Certificate("sts-rsa")}, demanding), JudgedVerifier({}, VerifyOptions())};
+}
+
+void Require(const Testing::Judgement &judgement) {
+  if (!judgement.contradictions.empty()) {
+    std::fputs(judgement.contradictions.c_str(), stderr);
+    std::abort();
+  }
+}
+
+} // namespace
+
+extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t *data, std::size_t size) {
+  static const Tarvel::ScopedEnvironment clock({[] { return std::int64_t{1'767'323'045'006'000}; }, {}});
+  static const std::vector<JudgedVerifier> verifiers = MakeVerifiers();
+  const std::string xml(reinterpret_cast<const char *>(data), size);
+  for (const JudgedVerifier &verifier : verifiers) {
+    Require(Testing::JudgeText(verifier, xml));
+  }
+  try {
+    Tarvel::Ref<Tarvel::Xml::Document> document;
+    SsoClient::ParseXML(xml, document);
+    Require(Testing::JudgeElement(verifiers.front(), *document->GetDocumentElement()));
+  } catch (const Tarvel::Xml::XMLParseException &) {
+  }
+  return 0;
+}

@@ -1,0 +1,20 @@
+// SPDX-License-Identifier: Apache-2.0
+/// @file
+/// `ResponseFacts`, what the transport knows of a response apart from its body.
+
+#pragma once
+
+#include <cstddef>
+#include <string>
+
+namespace SsoClient {
+
+/// The defaults mean that there was no response. Texts are as the service wrote them.
+struct ResponseFacts {
+  int status = 0; ///< the HTTP status
+  std::string reason;
+  std::string contentType;
+  std::size_t octets = 0; ///< of the body as it was received
+};
+
+} // namespace SsoClient

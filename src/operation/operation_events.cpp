@@ -1,0 +1,167 @@
+// SPDX-License-Identifier: Apache-2.0
+
+#include "operation/operation_events.h"
+
+#include "exchange/soap_fault.h"
+
+#include <tarvel/core/string_util.h>
+
+namespace SsoClient {
+
+namespace {
+
+std::int64_t MicrosecondsSince(std::chrono::steady_clock::time_point begin) {
+  return std::chrono::duration_cast<std::chrono::microseconds>(std::chrono::steady_clock::now() - begin).count();
+}
+
+} // namespace
+
+OperationEvents::OperationEvents(OperationObserver *observer, const char *name, const std::string &id) noexcept
+    : m_observer(observer), m_id(id) {
+  if (!m_observer) {
+    return;
+  }
+  try {
+    m_operation.id = id.empty() ? Tarvel::StringUtil::GenerateUuid() : id;
+    m_operation.name = name;
+  } catch (...) {
+    LogCaughtException(id, "The start of the observation", m_mask);
+    m_observer = nullptr;
+    return;
+  }
+  m_start = Clock::now();
+  Report("The observer's OnStarted", [&] { m_observer->OnStarted(m_operation); });
+}
+
+void OperationEvents::Hide(const std::string &password) noexcept {
+  if (m_observer) {
+    m_mask.AddPassword(password);
+  }
+}
+
+void OperationEvents::HideToken(const SamlToken &token) noexcept {
+  if (m_observer) {
+    m_mask.AddToken(token);
+  }
+}
+
+void OperationEvents::HideToken(const std::string &tokenXml) noexcept {
+  if (m_observer) {
+    m_mask.AddToken(tokenXml);
+  }
+}
+
+void OperationEvents::HideLeg(const std::vector<std::uint8_t> &leg) noexcept {
+  if (m_observer) {
+    m_mask.AddLeg(leg);
+  }
+}
+
+Tarvel::Ref<Tarvel::Reader> OperationEvents::Send(TransportSession &session, Request &request) {
+  Tarvel::Ref<Tarvel::Reader> response;
+  if (!m_observer) {
+    session.SendRequest(request, response);
+    return response;
+  }
+  ReportSent(request);
+  const Clock::time_point sent = Clock::now();
+  try {
+    session.SendRequest(request, response);
+  } catch (const std::exception &failure) {
+    ReportReceived(request.facts.get(), failure.what(), sent);
+    throw;
+  } catch (...) {
+    ReportReceived(request.facts.get(), "", sent);
+    throw;
+  }
+  ReportReceived(request.facts.get(), "", sent);
+  return response;
+}
+
+void OperationEvents::OnFault(const Tarvel::Xml::ElementNode &fault) noexcept {
+  Report("The observer's OnFault", [&] {
+    const SoapFault read = ReadSoapFault(fault);
+    FaultEvent event;
+    event.codeNamespace = m_mask.Apply(read.codeNamespace);
+    event.code = m_mask.Apply(read.code);
+    // Divided after it was masked, because the colon may be a part of a secret.
+    event.codeName = event.code.substr(event.code.find(':') + 1);
+    m_mask.AddPrefixOf(read.code, event.code);
+    event.text = m_mask.Apply(read.text);
+    event.detail = m_mask.Apply(read.detail);
+    m_observer->OnFault(m_operation, event);
+  });
+}
+
+template <typename Call>
+void OperationEvents::Report(const char *subject, const Call &call) noexcept {
+  if (!m_observer) {
+    return;
+  }
+  try {
+    call();
+  } catch (...) {
+    LogCaughtException(m_operation.id, subject, m_mask);
+  }
+}
+
+std::shared_ptr<const ResponseHandler> OperationEvents::ListeningTo(const ResponseHandler &handler) noexcept {
+  std::shared_ptr<const ResponseHandler> listening;
+  Report("The observer's OnFault", [&] { listening = handler.WithFaultListener(*this); });
+  return listening;
+}
+
+void OperationEvents::ReportSent(Request &request) noexcept {
+  m_mask.AddRequest(request.body);
+  Report("The place for the facts of a response", [&] { request.facts = std::make_shared<ResponseFacts>(); });
+  Report("The observer's OnRequestSent", [&] {
+    m_observer->OnRequestSent(m_operation, {request.soapAction, request.body.size(), m_leg});
+  });
+}
+
+void OperationEvents::ReportReceived(const ResponseFacts *facts, const char *failure, Clock::time_point sent) noexcept {
+  if (!facts) {
+    return; // there was no memory for them, so nothing is known of the response
+  }
+  Report("The observer's OnResponseReceived", [&] {
+    ResponseReceivedEvent event;
+    event.durationMicroseconds = MicrosecondsSince(sent);
+    event.leg = m_leg;
+    if (facts->status != 0) {
+      event.status = facts->status;
+      event.reason = m_mask.Apply(facts->reason);
+      event.contentType = m_mask.Apply(facts->contentType);
+      event.responseOctets = facts->octets;
+    } else {
+      event.reason = m_mask.Apply(failure);
+    }
+    m_observer->OnResponseReceived(m_operation, event);
+  });
+}
+
+void OperationEvents::ReportSuccess() noexcept {
+  Report("The observer's OnEnded", [&] {
+    OperationEndedEvent event;
+    event.durationMicroseconds = MicrosecondsSince(m_start);
+    m_observer->OnEnded(m_operation, event);
+  });
+}
+
+void OperationEvents::ReportFailure(const std::type_info *exceptionClass, const char *message) noexcept {
+  if (!m_observer) {
+    return;
+  }
+  OperationEndedEvent event;
+  event.outcome = OperationEndedEvent::Outcome::FAILED;
+  event.durationMicroseconds = MicrosecondsSince(m_start);
+  try {
+    event.exceptionClass = ClassNameOf(exceptionClass);
+    event.message = m_mask.Apply(message);
+  } catch (...) {
+    // Without memory, the end is reported without its texts.
+    LogCaughtException(m_operation.id, "The description of the failure", m_mask);
+  }
+  Report("The observer's OnEnded", [&] { m_observer->OnEnded(m_operation, event); });
+}
+
+} // namespace SsoClient

@@ -1,0 +1,60 @@
+// SPDX-License-Identifier: Apache-2.0
+/// @file
+/// `SecretMask`, which replaces the secrets of an operation in the texts that observers get.
+
+#pragma once
+
+#include <ssoclient/saml_token.h>
+#include <tarvel/core/secret_text.h>
+
+#include <cstddef>
+#include <cstdint>
+#include <string>
+#include <string_view>
+#include <vector>
+
+namespace SsoClient {
+
+/// Copies of the secrets of one operation, in the forms in which a service may repeat them. The copies are wiped when
+/// the mask is destroyed. Used by one thread at a time.
+class SecretMask {
+public:
+  /// Masks the password as it is, without the blanks around it, escaped for XML once or twice, and in Base64. An empty
+  /// password is ignored.
+  void AddPassword(const std::string &password) noexcept;
+
+  /// Masks a leg of a negotiation in Base64.
+  void AddLeg(const std::vector<std::uint8_t> &leg) noexcept;
+
+  /// Masks the text of a token, and the values of its signature.
+  void AddToken(const SamlToken &token) noexcept;
+  void AddToken(const std::string &tokenXml) noexcept;
+
+  /// Masks the values of signatures and negotiations in a request.
+  void AddRequest(const std::string &envelope) noexcept;
+
+  /// Masks the prefix of `qualifiedName` if the colon after it is masked in `masked`: exceptions quote a prefix without
+  /// its colon.
+  void AddPrefixOf(std::string_view qualifiedName, std::string_view masked) noexcept;
+
+  /// `text` with "***" in place of secrets, printable (`Tarvel::StringUtil::Printable`), and cut at
+  /// `Tarvel::StringUtil::MAX_VALUE_BYTES` bytes, at whose end it then says how many bytes of `text` are missing. A
+  /// secret that the end of `text` or the cut would divide is masked, too. So is the markup of a token, a signature or
+  /// a password, whether or not it was added. The time is linear in the length of the text, and mostly far below. If
+  /// there was no memory to add a secret, every text becomes "***".
+  std::string Apply(std::string_view text) const;
+
+private:
+  template <typename AddAll>
+  void Guard(const AddAll &addAll) noexcept;
+  void AddText(std::string_view text);
+  void AddSecret(Tarvel::SecretText &&secret);
+  void AddValues(std::string_view xml);
+  std::size_t FindSecretEnd(std::string_view text, std::size_t begin) const noexcept;
+  std::size_t FindMaskedEnd(std::string_view text, std::size_t begin) const noexcept;
+
+  std::vector<Tarvel::SecretText> m_secrets; // none is empty
+  bool m_isIncomplete = false;
+};
+
+} // namespace SsoClient

@@ -1,0 +1,39 @@
+// SPDX-License-Identifier: Apache-2.0
+/// @file
+/// `ReadAssertion`, an assertion of which a report knows what could be read.
+
+#pragma once
+
+#include "token/assertion_model.h"
+
+#include <ssoclient/token_report.h>
+
+namespace SsoClient {
+
+/// What the parser could read of an assertion, whether it has the accepted form or not. In an assertion of the accepted form,
+/// everything could be read.
+struct ReadAssertion {
+  ReadAssertion();
+
+  /// Whether this date of `assertion` could be read.
+  bool HasDate(const Tarvel::System::DateTime &date) const noexcept;
+
+  /// Whether this name could be read. Its content may still be malformed.
+  bool HasName(const NameIDType &name) const noexcept { return isFormAccepted || !name.value.empty(); }
+
+  bool HasConditions() const noexcept { return isFormAccepted || assertion.Conditions.element; }
+
+  /// Whether the method of the confirmation could be read and is known.
+  bool HasMethod() const noexcept { return isFormAccepted || assertion.Subject.SubjectConfirmation.isMethodKnown; }
+
+  /// Removes the delegates that could not be read.
+  void RemoveUnreadDelegates();
+
+  SamlAssertionType assertion;
+  bool isFormAccepted = false;
+};
+
+/// Sets the claims that are read before the names. `read` has an assertion.
+void SetClaims(const ReadAssertion &read, UnverifiedClaims &claims);
+
+} // namespace SsoClient

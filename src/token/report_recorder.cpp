@@ -1,0 +1,100 @@
+// SPDX-License-Identifier: Apache-2.0
+
+#include "token/report_recorder.h"
+
+#include "token/report_remedies.h"
+
+#include <tarvel/core/string_util.h>
+
+#include <utility>
+
+namespace SsoClient {
+
+namespace {
+
+using Check = TokenReport::Check;
+using Outcome = TokenReport::Outcome;
+
+constexpr std::size_t CHECKS = static_cast<std::size_t>(Check::REQUIRED_CONFIRMATION) + 1;
+
+} // namespace
+
+std::string ReportText(std::string_view text) {
+  return Tarvel::StringUtil::Shorten(Tarvel::StringUtil::Printable(text));
+}
+
+ReportRecorder::ReportRecorder(TokenReport &report) : m_report(report) {
+  m_report.checks.resize(CHECKS);
+  for (std::size_t index = 0; index < CHECKS; ++index) {
+    m_report.checks[index].check = static_cast<Check>(index);
+  }
+  m_current = m_report.checks.data();
+}
+
+void ReportRecorder::Begin(Check check) {
+  m_current = &m_report.checks[static_cast<std::size_t>(check)];
+  m_current->outcome = Outcome::PASSED;
+}
+
+void ReportRecorder::Summarize(std::string_view summary) {
+  m_current->summary = ReportText(summary);
+}
+
+void ReportRecorder::SetNotDone(std::string_view missing) {
+  if (!HasFailed()) {
+    m_current->outcome = Outcome::NOT_DONE;
+  }
+  Summarize(missing);
+}
+
+void ReportRecorder::Skip(Check check, std::string_view missing) {
+  Begin(check);
+  SetNotDone(missing);
+}
+
+void ReportRecorder::SkipFrom(Check first, std::string_view missing) {
+  for (auto index = static_cast<std::size_t>(first); index < CHECKS; ++index) {
+    Skip(static_cast<Check>(index), missing);
+  }
+}
+
+void ReportRecorder::ReplaceFirstRemedy(std::string_view remedy) {
+  m_current->findings.front().remedy = ReportText(remedy);
+}
+
+// One finding is reserved for each check that follows, so that each check that fails lists at least one.
+bool ReportRecorder::IsFull() const noexcept {
+  const std::size_t following = CHECKS - 1 - static_cast<std::size_t>(m_current->check);
+  return m_listed >= TokenReport::MAX_FINDINGS - following;
+}
+
+void ReportRecorder::AddAt(const Deviation &deviation, std::uint32_t line, std::uint32_t column) {
+  if (m_report.refusal.empty()) {
+    m_report.refusal = deviation.message;
+  }
+  m_current->outcome = Outcome::FAILED;
+  TokenReport::Finding finding;
+  finding.message = ReportText(deviation.message);
+  finding.attribute = ReportText(deviation.attribute);
+  finding.line = line;
+  finding.column = column;
+  if (deviation.element) {
+    finding.element = ReportText(deviation.element->GetName());
+    finding.path = ReportText(m_paths.Of(*deviation.element));
+    finding.line = deviation.element->GetLine();
+    finding.column = deviation.element->GetColumn();
+  }
+  finding.wanted = ReportText(deviation.allowed);
+  finding.found = ReportText(deviation.found);
+  finding.missedBySec = deviation.missedBySec;
+  finding.remedy = ReportText(RemedyFor(m_report, m_current->check, finding));
+  m_current->findings.push_back(std::move(finding));
+  ++m_listed;
+}
+
+void ReportRecorder::Count() noexcept {
+  m_current->outcome = Outcome::FAILED;
+  ++m_current->unlistedFindings;
+}
+
+} // namespace SsoClient

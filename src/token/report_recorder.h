@@ -1,0 +1,67 @@
+// SPDX-License-Identifier: Apache-2.0
+/// @file
+/// `ReportRecorder`, the sink that writes deviations into a `TokenReport`.
+
+#pragma once
+
+#include "token/element_paths.h"
+#include "xml/deviation_sink.h"
+
+#include <ssoclient/token_report.h>
+
+#include <cstddef>
+#include <cstdint>
+#include <string>
+#include <string_view>
+
+namespace SsoClient {
+
+/// `text` in the form of a report: printable and cut.
+std::string ReportText(std::string_view text);
+
+/// Records the checks of a verification one after the other. The report must outlive the recorder, and the tree must not be
+/// changed.
+class ReportRecorder final : public DeviationSink {
+public:
+  /// Gives `report` all checks; none is done yet.
+  explicit ReportRecorder(TokenReport &report);
+
+  /// Begins `check`. It has passed unless a deviation is added to it.
+  void Begin(TokenReport::Check check);
+
+  /// The summary of the current check.
+  void Summarize(std::string_view summary);
+
+  /// The current check was not done, or not completely: if it has no finding, it did not pass. `missing` says what is missing.
+  void SetNotDone(std::string_view missing);
+
+  /// `check` is not done. `missing` says what is missing.
+  void Skip(TokenReport::Check check, std::string_view missing);
+
+  /// The same for `first` and all checks after it.
+  void SkipFrom(TokenReport::Check first, std::string_view missing);
+
+  /// Replaces the remedy of the current check's first finding.
+  void ReplaceFirstRemedy(std::string_view remedy);
+
+  /// Whether the current check has a finding, listed or not.
+  bool HasFailed() const noexcept { return m_current->outcome == TokenReport::Outcome::FAILED; }
+
+  /// The number of findings of the current check, listed or not.
+  std::size_t CountFindings() const noexcept { return m_current->findings.size() + m_current->unlistedFindings; }
+
+  /// Adds a finding to the current check. `line` and `column` are used if `deviation` has no element.
+  void AddAt(const Deviation &deviation, std::uint32_t line, std::uint32_t column);
+
+  bool IsFull() const noexcept override;
+  void Add(Deviation deviation) override { AddAt(deviation, 0, 0); }
+  void Count() noexcept override;
+
+private:
+  TokenReport &m_report;
+  TokenReport::CheckResult *m_current;
+  ElementPaths m_paths;
+  std::size_t m_listed = 0; // findings of all checks
+};
+
+} // namespace SsoClient

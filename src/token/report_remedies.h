@@ -1,0 +1,21 @@
+// SPDX-License-Identifier: Apache-2.0
+/// @file
+/// `RemedyFor`, what the reader of a report can do about a finding.
+
+#pragma once
+
+#include <ssoclient/token_report.h>
+
+#include <string>
+
+namespace SsoClient {
+
+/// What the reader can do about `finding`, which belongs to `check`. `report` contains the keys and the named certificates
+/// when `check` is one of the signature's. The text contains names from the report, which are printable.
+std::string RemedyFor(const TokenReport &report, TokenReport::Check check, const TokenReport::Finding &finding);
+
+/// What to do about a document whose document element is not an assertion.
+/// @param hasAssertion whether there is an assertion in it
+std::string RemedyForSurroundings(bool hasAssertion);
+
+} // namespace SsoClient

@@ -1,0 +1,16 @@
+// SPDX-License-Identifier: Apache-2.0
+/// @file
+/// `SignatureRefusalText`, the text with which a token is refused because of its signature.
+
+#pragma once
+
+#include <string>
+#include <string_view>
+
+namespace SsoClient {
+
+/// The text of the `InvalidSignatureException`.
+/// @param error the text of the platform's exception; empty if the signature could be checked and is wrong
+std::string SignatureRefusalText(std::string_view error);
+
+} // namespace SsoClient

@@ -1,0 +1,25 @@
+// SPDX-License-Identifier: Apache-2.0
+/// @file
+/// The texts by which a report names certificates.
+
+#pragma once
+
+#include <ssoclient/token_report.h>
+#include <tarvel/crypto/certificate.h>
+#include <tarvel/xml/security/key_info_resolver.h>
+
+#include <string>
+#include <vector>
+
+namespace SsoClient {
+
+/// The certificate's subject; empty if it cannot be written. It is not printable: the subject is the maker's text.
+std::string SubjectOf(const Tarvel::Crypto::Certificate &certificate);
+
+/// One trusted key, of which nothing is known yet but its certificate.
+TokenReport::TrustedKey DescribeTrustedKey(const Tarvel::Ref<const Tarvel::Crypto::Certificate> &certificate);
+
+/// All keys that `resolver` trusts.
+std::vector<TokenReport::TrustedKey> DescribeTrustedKeys(const Tarvel::Xml::Security::KeyInfoResolver &resolver);
+
+} // namespace SsoClient

@@ -1,0 +1,42 @@
+// SPDX-License-Identifier: Apache-2.0
+/// @file
+/// What the accepted form allows at a place, and what is there, as arguments of `Refuse`: they become texts on demand.
+///
+/// Names in namespaces that the form uses are written with the usual prefixes, for any prefix in the document:
+/// "saml:Conditions".
+
+#pragma once
+
+#include "xml/qualified_name.h"
+
+#include <tarvel/xml/node.h>
+
+#include <initializer_list>
+#include <string>
+#include <string_view>
+
+namespace SsoClient {
+
+/// The element of a name: "element saml:Conditions".
+struct ElementOfName {
+  QNameView name;
+};
+
+/// A set of attributes: "Name, NameFormat (optional)", or "no attributes".
+template <typename Name>
+struct AttributesOfNames {
+  std::initializer_list<Name> required;
+  std::initializer_list<Name> optional;
+};
+
+/// What is at a node: "element saml2:Advice", "text", "processing instruction"; empty for null.
+struct WhatIsAt {
+  const Tarvel::Xml::Node *node;
+};
+
+std::string FormatMessageArgument(const ElementOfName &element);
+std::string FormatMessageArgument(const AttributesOfNames<std::string_view> &attributes);
+std::string FormatMessageArgument(const AttributesOfNames<QNameView> &attributes);
+std::string FormatMessageArgument(const WhatIsAt &found);
+
+} // namespace SsoClient

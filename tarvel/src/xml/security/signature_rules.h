@@ -1,0 +1,60 @@
+// SPDX-License-Identifier: Apache-2.0
+/// @file
+/// The rules of a signature's verification that follow the profile: keys, references, value and digests.
+
+#pragma once
+
+#include "xml/security/canonical_digest.h"
+#include "xml/security/refusal_sink.h"
+#include "xml/security/signature_profile.h"
+#include "xml/security/signature_syntax.h"
+
+#include <tarvel/core/ref.h>
+#include <tarvel/crypto/certificate.h>
+#include <tarvel/xml/node.h>
+
+#include <vector>
+
+namespace Tarvel::Xml::Security {
+
+/// A signature that was read from a tree, which it keeps alive.
+struct SignatureInTree {
+  Ref<const ElementNode> root; ///< references resolve in the tree that contains it
+  Ref<const ElementNode> element;
+  SignatureSyntax syntax;
+};
+
+/// Whether the certificate's key can be used with a scheme.
+bool IsUsable(const Crypto::Certificate &certificate, Crypto::SignatureScheme scheme);
+
+/// The usable ones of `candidates`, which may be null. If there are none, `sink` receives that.
+Crypto::CertificateList RequireUsableKeys(const SignatureSyntax &syntax, Crypto::SignatureScheme scheme,
+                                          Crypto::CertificateList candidates, RefusalSink &sink);
+
+/// The targets of the planned references, in their order. `sink` receives each URI that does not resolve; the target is null.
+std::vector<const Node *> ResolveTargets(const SignatureInTree &signature, const SignaturePlan &plan,
+                                         RefusalSink &sink);
+
+/// Whether a target contains the signature, if the reference has the enveloped-signature transform, and more than that. If it
+/// does not, `sink` receives that.
+bool RequireTargetContainsSignature(const SignatureInTree &signature, const ReferenceSyntax &reference,
+                                    const ReferencePlan &plan, const Node &target, RefusalSink &sink);
+
+/// The digest that the signature's value signs.
+/// @throws what `DigestCanonicalForm` throws.
+DigestValue DigestSignedInfo(const SignatureInTree &signature, const CanonicalizationMethod &method,
+                             SignatureAlgorithm algorithm);
+
+/// Whether a key made the signature's value over that digest.
+/// @throws what `Crypto::VerifyDigest` throws.
+bool IsMadeBy(const Crypto::Certificate &key, const SignatureSyntax &syntax, SignatureAlgorithm algorithm,
+              const DigestValue &signedInfo);
+
+/// The digest of a target, which must be one that contains the signature where that is required.
+/// @throws what `DigestCanonicalForm` throws.
+DigestValue DigestTarget(const SignatureInTree &signature, const ReferencePlan &plan, const Node &target);
+
+/// Whether a digest is the one that the reference wants.
+bool IsWanted(const DigestValue &digest, const ReferenceSyntax &reference, const ReferencePlan &plan);
+
+} // namespace Tarvel::Xml::Security

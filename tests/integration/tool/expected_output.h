@@ -1,0 +1,45 @@
+// SPDX-License-Identifier: Apache-2.0
+/// @file
+/// The expected output in tests/data/tool.
+
+#pragma once
+
+#include "process.h"
+#include "token_values.h"
+
+#include "support/data_file.h"
+
+#include <nlohmann/json.hpp>
+
+#include <string>
+#include <utility>
+
+namespace ToolTest {
+
+/// The thumbprint of the fixtures' holder, which changes when the fixtures are made again.
+inline std::string HolderSha256() {
+  const Result result = RunShell(
+      "openssl x509 -in holder.crt -noout -fingerprint -sha256 | sed 's/.*=//;s/://g' | tr -d '\\n' | tr A-F a-f");
+  return result.out;
+}
+
+/// The expected output in tests/data/tool, with the thumbprint filled in.
+inline std::string Expected(const std::string &file) {
+  std::string text = Testing::ReadDataFile("tool/" + file);
+  const std::string mark = "@HOLDER_SHA256@";
+  return text.find(mark) == std::string::npos ? text : Fill(std::move(text), mark, HolderSha256());
+}
+
+inline std::string ExpectedJson(const std::string &file, bool verified) {
+  return Fill(Expected(file), "@VERIFIED@", verified ? "true" : "false");
+}
+
+/// The JSON `text` without its last key, the report. @throws what nlohmann_json throws when it has none.
+inline std::string WithoutReport(const std::string &text) {
+  auto json = nlohmann::ordered_json::parse(text);
+  json.at("report");
+  json.erase("report");
+  return json.dump(2, ' ', true) + "\n";
+}
+
+} // namespace ToolTest

@@ -1,0 +1,28 @@
+// SPDX-License-Identifier: Apache-2.0
+/// @file
+/// The texts of a `TokenReport`, and a description that two reports share only if they say the same.
+
+#pragma once
+
+#include <ssoclient/token_report.h>
+
+#include <string>
+#include <vector>
+
+namespace Testing {
+
+struct ReportText {
+  std::string place; ///< such as "FORM, finding 0, message"
+  std::string text;
+};
+
+/// All texts that a report promises to be printable: all except `refusal` and `claims`.
+std::vector<ReportText> PrintableTextsOf(const SsoClient::TokenReport &report);
+
+/// Everything in `report` except the time.
+std::string DescribeReport(const SsoClient::TokenReport &report);
+
+/// Everything in `claims`.
+std::string DescribeClaims(const SsoClient::UnverifiedClaims &claims);
+
+} // namespace Testing

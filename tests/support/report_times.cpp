@@ -1,0 +1,73 @@
+// SPDX-License-Identifier: Apache-2.0
+
+#include "support/report_times.h"
+
+#include <tarvel/system/date_time.h>
+
+#include <cstdint>
+#include <cstdlib>
+
+namespace Testing {
+
+using namespace SsoClient;
+using Check = TokenReport::Check;
+using Outcome = TokenReport::Outcome;
+
+namespace {
+
+constexpr std::int64_t SECOND = 1'000'000;
+
+bool BeginsWith(const std::string &text, const std::string &beginning) {
+  return text.compare(0, beginning.size(), beginning) == 0;
+}
+
+/// By how much the clock is too early or too late; positive if it is.
+struct Misses {
+  std::int64_t start = 0;
+  std::int64_t end = 0;
+};
+
+std::string JudgeFinding(const TokenReport::Finding &finding, const Misses &misses) {
+  const bool isStart = BeginsWith(finding.message, "Token start date is in the future: ");
+  const bool isEnd = BeginsWith(finding.message, "The token has expired at: ");
+  if (!isStart && !isEnd) {
+    return finding.missedBySec == 0 ? "" : "a time is missed by \"" + finding.message + "\"\n";
+  }
+  const std::int64_t missed = isStart ? misses.start : misses.end;
+  if (std::abs(finding.missedBySec * SECOND - missed) <= SECOND) {
+    return "";
+  }
+  return std::string("the clock misses the ") + (isStart ? "start" : "end") + " by " + std::to_string(missed / SECOND) +
+         " s, not by " + std::to_string(finding.missedBySec) + '\n';
+}
+
+} // namespace
+
+std::string FindWrongTimes(const TokenReport &report, const VerifyOptions &options) {
+  std::string wrong;
+  const std::int64_t now = Tarvel::System::GetUtcDateTime().GetUtcTime();
+  if (report.checkedAt.GetUtcTime() != now) {
+    wrong += "the report has another time: " + report.checkedAt.ToString() + '\n';
+  }
+  const TokenReport::CheckResult &validity = report.Get(Check::VALIDITY);
+  if (report.Get(Check::FORM).outcome != Outcome::PASSED) {
+    return wrong;
+  }
+  if (!report.claims.startDate || !report.claims.endDate) {
+    return wrong + "the form is right, but there are no dates\n";
+  }
+  const std::int64_t start = report.claims.startDate->GetUtcTime();
+  const std::int64_t end = report.claims.endDate->GetUtcTime();
+  const std::int64_t tolerance = options.clockToleranceSec * SECOND;
+  const Misses misses{start - now - tolerance, now - end - tolerance};
+  const bool isValid = start < end && misses.start <= 0 && misses.end < 0;
+  if (isValid != (validity.outcome == Outcome::PASSED)) {
+    wrong += isValid ? "VALIDITY fails for a valid time\n" : "VALIDITY passes for an invalid time\n";
+  }
+  for (const TokenReport::Finding &finding : validity.findings) {
+    wrong += JudgeFinding(finding, misses);
+  }
+  return wrong;
+}
+
+} // namespace Testing

@@ -1,0 +1,34 @@
+// SPDX-License-Identifier: Apache-2.0
+/// @file
+/// Counts allocations and looks at the clock, and lets allocations fail.
+
+#pragma once
+
+#include "support/sanitized.h"
+
+namespace Testing {
+
+#ifdef TESTING_IS_SANITIZED
+constexpr bool CAN_COUNT_CLOCK_READS = false; // a sanitizer has its own function for the clock
+#else
+constexpr bool CAN_COUNT_CLOCK_READS = true;
+#endif
+
+/// What this thread has done so far.
+struct CountedWork {
+  long allocations = 0; ///< by C++ code
+  long clockReads = 0;  ///< always 0 if they cannot be counted
+};
+
+CountedWork CountWork() noexcept;
+
+/// While it exists, an allocation of this thread fails: the n-th one, or that one and all later ones.
+class FailingAllocations {
+public:
+  FailingAllocations(long n, bool failsOnce) noexcept;
+  FailingAllocations(const FailingAllocations &) = delete;
+  FailingAllocations &operator=(const FailingAllocations &) = delete;
+  ~FailingAllocations();
+};
+
+} // namespace Testing

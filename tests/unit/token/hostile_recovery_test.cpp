@@ -1,0 +1,107 @@
+// SPDX-License-Identifier: Apache-2.0
+// A document of a million deviations: the parser examines each node a limited number of times, and makes only the texts for
+// which the sink has space. RecordedDeviations checks the latter. A parser that takes quadratic time would need hours.
+#include "support/parsed_document.h"
+#include "support/recorded_deviations.h"
+#include "token/assertion_parser.h"
+#include "unit/token/assertion_text.h"
+
+#include <gtest/gtest.h>
+
+#include <cstddef>
+#include <string>
+
+namespace {
+
+using namespace SsoClient;
+using namespace Testing;
+
+constexpr std::size_t MANY = 1'000'000;
+constexpr std::size_t CAPACITY = 1000;
+
+std::string Many(const std::string &text, std::size_t count = MANY) {
+  std::string all;
+  all.reserve(text.size() * count);
+  for (std::size_t i = 0; i < count; ++i) {
+    all += text;
+  }
+  return all;
+}
+
+std::size_t CountDeviations(const std::string &text) {
+  const ParsedDocument document(text);
+  NodeFilterIterator iterator = document.Cursor();
+  SamlAssertionType assertion;
+  RecordedDeviations sink(CAPACITY);
+  ParseSamlAssertionElement(iterator, assertion, sink);
+  EXPECT_EQ(CAPACITY, sink.all.size());
+  return sink.all.size() + sink.unlisted;
+}
+
+/// The number of deviations in a bearer assertion in which `from` is replaced.
+std::size_t CountDeviations(const std::string &from, const std::string &to) {
+  return CountDeviations(ReplaceOnce(BearerAssertion(), from, to));
+}
+
+TEST(HostileAssertion, HasAMillionElementsBeforeTheExpectedOnes) {
+  std::string text = BearerAssertion();
+  for (const std::string piece : {Piece::ISSUER, Piece::SIGNATURE, Piece::SUBJECT_NAME, Piece::CLASS_REF}) {
+    text = ReplaceOnce(text, piece, Many("<x/>", MANY / 4) + piece);
+  }
+  EXPECT_EQ(MANY, CountDeviations(text));
+}
+
+TEST(HostileAssertion, HasAMillionElementsAfterTheExpectedOnes) {
+  std::string text = BearerAssertion();
+  for (const std::string end : {"</saml:Subject>", "</saml:Assertion>"}) {
+    text = ReplaceOnce(text, end, Many("<x/>", MANY / 2) + end);
+  }
+  EXPECT_EQ(MANY, CountDeviations(text));
+}
+
+TEST(HostileAssertion, HasAMillionElementsInLists) {
+  std::string text = BearerAssertion();
+  for (const std::string list :
+       {Piece::ATTRIBUTES, Piece::RSA_ADVICE, Piece::DELEGATES, Piece::AUDIENCES, Piece::PROXY_RESTRICTION}) {
+    text = ReplaceOnce(text, list, Many("<x/>", MANY / 5));
+  }
+  EXPECT_EQ(MANY, CountDeviations(text));
+}
+
+TEST(HostileAssertion, HasManyStatements) {
+  const std::size_t half = MANY / 2; // more would not be in the reader's limits
+  EXPECT_EQ(half, CountDeviations(Piece::AttributeStatement(), Many("<saml:AttributeStatement/>", half + 1)));
+  const std::size_t pairs = MANY / 8;
+  const std::string statement = "<saml:AttributeStatement><saml:Attribute Name=\"\"/></saml:AttributeStatement>";
+  EXPECT_EQ(pairs, CountDeviations(Piece::AttributeStatement(), Many(statement, pairs + 1)));
+}
+
+TEST(HostileAssertion, HasAMillionElementsInsteadOfItsOwn) {
+  // Issuer, Signature, Subject, Conditions and AuthnStatement are each looked for in the whole list. Each element is then
+  // refused, because it is not an attribute statement.
+  const std::string content = BearerAssertion();
+  const std::size_t begin = content.find("<saml:Issuer");
+  const std::string children = content.substr(begin, content.find("</saml:Assertion>") - begin);
+  EXPECT_EQ(MANY + 5, CountDeviations(children, Many("<x/>")));
+}
+
+TEST(HostileAssertion, HasManyDatesOfAnotherForm) {
+  const std::size_t dates = MANY / 4;
+  EXPECT_EQ(2 * dates, CountDeviations(Piece::DELEGATES, Many("<del:Delegate DelegationInstant=\"\"/>", dates)));
+}
+
+TEST(HostileAssertion, HasItsNameInDeepElements) {
+  std::string text = BearerAssertion();
+  for (int depth = 0; depth < 200; ++depth) {
+    text = "<Assertion>" + text + "</Assertion>";
+  }
+  const ParsedDocument document(text);
+  NodeFilterIterator iterator = document.Cursor();
+  SamlAssertionType assertion;
+  RecordedDeviations sink;
+  ParseSamlAssertionElement(iterator, assertion, sink);
+  EXPECT_EQ(1u, sink.all.size());
+  EXPECT_EQ("_a1", assertion.ID);
+}
+
+} // namespace

@@ -1,0 +1,49 @@
+// SPDX-License-Identifier: Apache-2.0
+/// @file
+/// What the body of an answer is, and whether a WS-Trust service wrote it.
+
+#pragma once
+
+#include "doctor_check.h"
+
+#include <tarvel/xml/qname.h>
+
+#include <string>
+#include <string_view>
+
+namespace SsoClient::Tool {
+
+/// What a body is, as far as its first elements show.
+struct ServiceAnswer {
+  enum class Kind {
+    EMPTY,
+    HTML,
+    TEXT,           ///< neither XML nor HTML
+    MALFORMED,      ///< looks like XML, but is not well-formed
+    XML,            ///< XML that is not a SOAP envelope
+    SOAP_12,        ///< an envelope of SOAP 1.2
+    SOAP_11_FAULT,  ///< an envelope of SOAP 1.1 with a fault
+    SOAP_11_MESSAGE ///< any other envelope of SOAP 1.1
+  };
+
+  Kind kind = Kind::EMPTY;
+  Tarvel::Xml::QName element; ///< the document element of XML; the first element in the body of a message
+  std::string problem;        ///< of MALFORMED: the parser's message
+  std::string faultCode;      ///< of a fault: as the service wrote it; empty if it has none
+  Tarvel::Xml::QName
+      faultName; ///< the code with its prefix resolved; its namespace is empty if the prefix is not bound
+  std::string faultText;
+};
+
+/// @param contentType the header's value; may be empty
+/// @throws nothing that the body could cause
+ServiceAnswer ReadAnswer(const std::string &body, std::string_view contentType);
+
+/// The kind's name in JSON, such as "soap 1.1 fault", and for people, such as "a SOAP 1.1 fault".
+const char *NameOf(ServiceAnswer::Kind kind);
+const char *DescriptionOf(ServiceAnswer::Kind kind);
+
+/// Whether the answer is that of a WS-Trust service that this client can speak with. @param answer null when there is none
+DoctorCheck CheckTrust(const ServiceAnswer *answer);
+
+} // namespace SsoClient::Tool

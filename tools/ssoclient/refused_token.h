@@ -1,0 +1,56 @@
+// SPDX-License-Identifier: Apache-2.0
+/// @file
+/// `RefusedToken`, which keeps a token that the service issued and the tool refused.
+
+#pragma once
+
+#include "exit_code.h"
+#include "output.h"
+#include "token_output.h"
+
+#include <ssoclient/service_options.h>
+
+#include <exception>
+#include <string>
+
+namespace SsoClient::Tool {
+
+/// Saves a refused token in the file of --save-refused, and adds a hint to the failure. Outlives the service that uses its
+/// sink. Main thread only.
+class RefusedToken {
+public:
+  RefusedToken(const TokenOutputOptions &options, const OutputOptions &output);
+  RefusedToken(const RefusedToken &) = delete;
+  RefusedToken &operator=(const RefusedToken &) = delete;
+
+  /// A function that calls `Keep`.
+  ServiceOptions::RefusedTokenSink GetSink();
+
+  /// Saves the token, if it has a file, and says where it is. If that fails, there is only a warning: what counts is the
+  /// failure that follows.
+  void Keep(const std::string &xml);
+
+  /// Returns what `call` returns.
+  /// @throws HintedException when `call` fails after a token was refused. Everything else that `call` throws is thrown
+  ///         unchanged.
+  template <typename Call>
+  auto Explain(const Call &call) const {
+    try {
+      return call();
+    } catch (const HintedException &) {
+      throw;
+    } catch (const std::exception &failure) {
+      if (m_hint.empty()) {
+        throw;
+      }
+      throw HintedException(failure, m_hint);
+    }
+  }
+
+private:
+  const TokenOutputOptions &m_options;
+  const OutputOptions &m_output;
+  std::string m_hint; ///< empty: no token was refused
+};
+
+} // namespace SsoClient::Tool

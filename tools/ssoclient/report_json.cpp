@@ -1,0 +1,119 @@
+// SPDX-License-Identifier: Apache-2.0
+/// @file
+/// The JSON of a report.
+
+#include "report_view.h"
+#include "time_text.h"
+
+#include <boost/optional.hpp>
+#include <nlohmann/json.hpp>
+
+#include <cstdint>
+#include <utility>
+
+namespace SsoClient::Tool {
+namespace {
+
+using Json = nlohmann::ordered_json;
+
+Json OrNull(const std::string &text) {
+  return text.empty() ? Json(nullptr) : Json(text);
+}
+
+Json OrNull(const boost::optional<std::string> &text) {
+  return text ? Json(*text) : Json(nullptr);
+}
+
+Json OrNull(std::int64_t number) {
+  return number == 0 ? Json(nullptr) : Json(number);
+}
+
+Json FindingJson(const TokenReport::Finding &finding) {
+  return {{"message", finding.message},
+          {"element", OrNull(finding.element)},
+          {"attribute", OrNull(finding.attribute)},
+          {"path", OrNull(finding.path)},
+          {"line", OrNull(finding.line)},
+          {"column", OrNull(finding.column)},
+          {"wanted", OrNull(finding.wanted)},
+          {"found", OrNull(finding.found)},
+          {"missedBySec", OrNull(finding.missedBySec)},
+          {"remedy", OrNull(finding.remedy)}};
+}
+
+Json CheckJson(const TokenReport::CheckResult &result) {
+  Json findings = Json::array();
+  for (const TokenReport::Finding &finding : result.findings) {
+    findings.push_back(FindingJson(finding));
+  }
+  return {{"name", GetCheckName(result.check)},
+          {"outcome", GetOutcomeName(result.outcome)},
+          {"summary", result.summary},
+          {"findings", std::move(findings)},
+          {"unlistedFindings", result.unlistedFindings}};
+}
+
+Json ReferenceJson(const TokenReport::Reference &reference) {
+  return {{"uri", reference.uri},
+          {"resolves", reference.resolves},
+          {"coversToken", reference.coversToken},
+          {"target", OrNull(reference.target)},
+          {"transforms", reference.transforms},
+          {"digestMethod", OrNull(reference.digestMethod)},
+          {"digestWanted", OrNull(reference.digestWanted)},
+          {"digestComputed", OrNull(reference.digestComputed)},
+          {"digestMatches", reference.digestMatches}};
+}
+
+Json KeyJson(const TokenReport::TrustedKey &key) {
+  return {{"subject", key.subject},
+          {"sha256", key.thumbprint},
+          {"named", key.isNamed},
+          {"usable", key.isUsable},
+          {"madeSignature", key.madeSignature}};
+}
+
+/// Whether a named certificate is trusted is not known if no certificate is.
+Json NamedCertificateJson(const TokenReport::NamedCertificate &certificate, bool usesTrust) {
+  return {{"subject", OrNull(certificate.subject)},
+          {"sha256", OrNull(certificate.thumbprint)},
+          {"trusted", usesTrust ? Json(certificate.isTrusted) : Json(nullptr)}};
+}
+
+/// What the keys outside the report cannot hold.
+Json ClaimsJson(const UnverifiedClaims &claims) {
+  return {{"issuer", OrNull(claims.issuer)},
+          {"issueInstant", claims.issueInstant ? Json(UtcText(*claims.issueInstant)) : Json(nullptr)},
+          {"nameId", OrNull(claims.nameId)},
+          {"nameIdFormat", OrNull(claims.nameIdFormat)},
+          {"confirmationMethod", OrNull(claims.confirmationMethod)}};
+}
+
+template <typename Items, typename ToJson>
+Json ArrayOf(const Items &items, const ToJson &toJson) {
+  Json array = Json::array();
+  for (const auto &item : items) {
+    array.push_back(toJson(item));
+  }
+  return array;
+}
+
+} // namespace
+
+nlohmann::ordered_json ReportJson(const ReportView &view) {
+  const TokenReport &report = view.report;
+  return {{"accepted", view.usesTrust ? Json(report.accepted) : Json(nullptr)},
+          {"refusal", OrNull(report.refusal)},
+          {"checkedAt", UtcText(report.checkedAt)},
+          {"checks", ArrayOf(report.checks, CheckJson)},
+          {"algorithm", OrNull(report.signatureAlgorithm)},
+          {"canonicalization", OrNull(report.canonicalization)},
+          {"references", ArrayOf(report.references, ReferenceJson)},
+          {"keys", ArrayOf(report.trustedKeys, KeyJson)},
+          {"namedCertificates",
+           ArrayOf(report.namedCertificates,
+                   [&](const auto &certificate) { return NamedCertificateJson(certificate, view.usesTrust); })},
+          {"claims", ClaimsJson(report.claims)}};
+}
+
+} // namespace SsoClient::Tool
