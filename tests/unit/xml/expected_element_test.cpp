@@ -31,8 +31,8 @@ struct Taken {
   friend bool operator==(const Taken &, const Taken &) = default;
   friend std::ostream &operator<<(std::ostream &out, const Taken &taken) {
     out << "took " << taken.element << ", next is " << taken.next << ", refused:";
-    for (const std::string &refused : taken.refused) {
-      out << " [" << refused << "]";
+    for (const std::string &found : taken.refused) {
+      out << " [" << found << "]";
     }
     return out;
   }
