@@ -24,8 +24,7 @@ constexpr std::string_view END_OF_NAME = " \t\r\n/>&";
 /// repeats.
 constexpr std::size_t MIN_BEGINNING = 8;
 
-/// The number of bytes after which secrets that overlap are not told apart any more, and the rest of the text is
-/// masked.
+/// The length of overlapping secrets after which the rest of the text is masked, too.
 constexpr std::size_t MAX_OVERLAP_BYTES = std::size_t{1} << 20;
 
 SecretText WithoutWhiteSpace(std::string_view text) {

@@ -155,14 +155,14 @@ TEST(ObserverOverTls, FollowsALegOfANegotiation) {
   const auto observer = std::make_shared<RecordedEvents>();
   ServiceOptions options;
   options.observer = observer;
-  const auto negotiation = InternalApi::CreateGssNegotiationContext(
-      ConfigFor(*context, "", RunningService().GetUrl()), SpecFor(3600), options);
+  const auto negotiation = InternalApi::CreateGssNegotiationContext(ConfigFor(*context, "", RunningService().GetUrl()),
+                                                                    SpecFor(3600), options);
   EXPECT_THROW(negotiation->NegotiateToken({1, 2, 3}), SsoException);
   EXPECT_EQ(observer->Lines(),
             (Texts{"started NegotiateToken", std::string("sent ") + ISSUE + ", leg 1",
                    "received 500 Internal Server Error, text/xml; charset=utf-8, leg 1",
-                   "fault {http://docs.oasis-open.org/ws-sx/ws-trust/200512}RequestFailed wst:RequestFailed: the service "
-                   "was started without a keytab and does not negotiate ()",
+                   "fault {http://docs.oasis-open.org/ws-sx/ws-trust/200512}RequestFailed wst:RequestFailed: the "
+                   "service was started without a keytab and does not negotiate ()",
                    "ended SsoException: Unexpected SOAP fault: wst:RequestFailed; request failed."}));
 }
 

@@ -152,6 +152,7 @@ TEST(SecretMask, MasksTheMarkupOfEachSecretElement) {
       {"[&amp;Assertion&amp;/Assertion]", "[&amp;Assertion&amp;/Assertion]"},
       {"[<ds:Signature><ds:SignatureValue>a</ds:SignatureValue></ds:Signature>]", "[***>]"},
       {"[<Password>a<Password>b</Password>c</Password>d]", "[***>d]"},
+      {"[<Password>a</PasswordHint>b</Password>c]", "[***>c]"}, // the end tag of another element
       {"[<wsse:BinarySecurityToken>MII", "[***"},
       {"[<Assertion/>", "[***"},
       {"[<AssertionConsumer>text</AssertionConsumer>]", "[<AssertionConsumer>text</AssertionConsumer>]"},
