@@ -14,11 +14,16 @@
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
 
+#include <cstdint>
 #include <future>
+#include <stdexcept>
 #include <string>
 #include <vector>
 
+#include <netinet/in.h>
 #include <openssl/ssl.h>
+#include <sys/socket.h>
+#include <unistd.h>
 
 namespace Tarvel::Ssl {
 namespace {
@@ -264,6 +269,41 @@ TEST(ProbeServer, TriesEachAddressAndUsesTheFirstThatAnswers) {
   EXPECT_EQ("127.0.0.1", probe.addresses[1].address);
   EXPECT_EQ(AddressProbe::Outcome::ANSWERED, probe.addresses[1].outcome);
   EXPECT_EQ("", probe.addresses[1].reason);
+  ASSERT_TRUE(probe.handshake);
+  EXPECT_EQ(Outcome::ACCEPTED, probe.handshake->outcome);
+}
+
+/// Accepts TCP connections at 127.0.0.2 and never reads from them.
+class SilentNeighbour {
+public:
+  explicit SilentNeighbour(int port) : m_listener(::socket(AF_INET, SOCK_STREAM | SOCK_CLOEXEC, 0)) {
+    sockaddr_in address{};
+    address.sin_family = AF_INET;
+    address.sin_port = htons(static_cast<std::uint16_t>(port));
+    address.sin_addr.s_addr = htonl(INADDR_LOOPBACK + 1);
+    if (::bind(m_listener, reinterpret_cast<sockaddr *>(&address), sizeof address) != 0 ||
+        ::listen(m_listener, 1) != 0) {
+      throw std::runtime_error("no listener at 127.0.0.2");
+    }
+  }
+  SilentNeighbour(const SilentNeighbour &) = delete;
+  SilentNeighbour &operator=(const SilentNeighbour &) = delete;
+  ~SilentNeighbour() { ::close(m_listener); }
+
+private:
+  int m_listener;
+};
+
+TEST(ProbeServer, UsesTheFirstInOrderWhenSeveralAddressesAnswer) {
+  ListeningServer server(Settings("localhost"));
+  const SilentNeighbour neighbour(server.GetPort());
+  const System::ScopedNameLookup lookup([](const std::string &) {
+    return System::AddressList{boost::asio::ip::make_address("127.0.0.1"), boost::asio::ip::make_address("127.0.0.2")};
+  });
+  const ServerProbe probe = ProbeServer("localhost", server.GetPort(), CreateTrustingContext(), "", PATIENCE);
+  ASSERT_EQ(2u, probe.addresses.size());
+  EXPECT_EQ(AddressProbe::Outcome::ANSWERED, probe.addresses[0].outcome);
+  EXPECT_EQ(AddressProbe::Outcome::ANSWERED, probe.addresses[1].outcome);
   ASSERT_TRUE(probe.handshake);
   EXPECT_EQ(Outcome::ACCEPTED, probe.handshake->outcome);
 }
