@@ -86,7 +86,7 @@ Tarvel::Ref<Tarvel::Ssl::SSLContext> CreateContext(const ConnectionOptions &opti
   if (!IsSecure(options.url)) {
     return nullptr;
   }
-  const Tarvel::Ref<Tarvel::Ssl::SSLContext> context = Tarvel::Ssl::CreateSSLContext();
+  Tarvel::Ref<Tarvel::Ssl::SSLContext> context = Tarvel::Ssl::CreateSSLContext();
   if (!options.caFile.empty()) {
     context->TrustFile(options.caFile);
   } else if (options.thumbprint.empty()) {
