@@ -43,7 +43,8 @@ ServiceAnswer ReadAnswer(const std::string &body, std::string_view contentType);
 const char *NameOf(ServiceAnswer::Kind kind);
 const char *DescriptionOf(ServiceAnswer::Kind kind);
 
-/// Whether the answer is that of a WS-Trust service that this client can speak with. @param answer null when there is none
+/// Whether the answer is that of a WS-Trust service that this client can speak with.
+/// @param answer null without an answer
 DoctorCheck CheckTrust(const ServiceAnswer *answer);
 
 } // namespace SsoClient::Tool
