@@ -135,7 +135,7 @@ std::string RemedyFor(const TokenReport &report, Check check, const Finding &fin
 
 std::string RemedyForSurroundings(bool hasSaml2) {
   return hasSaml2 ? "Give only the Assertion element, with the namespace declarations that it needs."
-                      : "Give a SAML 2.0 assertion: there is none in this document.";
+                  : "Give a SAML 2.0 assertion: there is none in this document.";
 }
 
 } // namespace SsoClient
