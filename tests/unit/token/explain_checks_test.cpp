@@ -307,7 +307,7 @@ TEST_F(ExplainChecks, AnAssertionOfAnEarlierVersionIsReportedButNotAccepted) {
               report.Get(Check::FORM).summary);
     EXPECT_LT(5u, report.Get(Check::FORM).findings.size());
     EXPECT_TRUE(report.claims.isAssertion);
-    EXPECT_EQ("_1", report.claims.id);
+    EXPECT_EQ("_1", report.claims.id.value());
   }
 }
 
