@@ -74,7 +74,7 @@ std::string ForKeys(const TokenReport &report) {
 std::string ForSignature(const TokenReport &report) {
   const bool isNamed = std::any_of(report.trustedKeys.begin(), report.trustedKeys.end(),
                                    [](const TokenReport::TrustedKey &key) { return key.isNamed; });
-  if (isNamed && !report.namedCertificates.empty() && !FindStranger(report)) {
+  if (isNamed && !FindStranger(report)) {
     return "Use the token exactly as the service sent it. If it is unchanged, it may be forged: it names a trusted "
            "certificate whose key did not make its signature.";
   }

@@ -114,9 +114,7 @@ void ParseAttributeStatementElement(NodeFilterIterator &iterator, AttributeState
   }
   const ElementNode &element = *IteratorToElement(taken);
   RequireNoAttributes(element, sink);
-  if (statement.attributes.empty()) { // reserving for each statement would move all attributes each time
-    statement.attributes.reserve(CountPossibleAttributes(element));
-  }
+  statement.attributes.reserve(CountPossibleAttributes(element));
   NodeFilterIterator child = taken.GetChild();
   while (child.node) {
     if (!ParseAttributeElement(child, statement.attributes.emplace_back(), sink)) {

@@ -10,7 +10,6 @@ namespace SsoClient {
 namespace {
 
 using Tarvel::Xml::ElementNode;
-using Tarvel::Xml::Node;
 
 bool HasLocalName(const NodeFilterIterator &iterator, std::string_view localName) {
   const ElementNode *const element = IteratorToElement(iterator);
@@ -22,12 +21,10 @@ NodeFilterIterator PastTheEnd(NodeFilterIterator iterator) {
   return iterator;
 }
 
-/// A cursor on the first element of that name from the cursor to `end`. If there is none, on the first that has the local
-/// name.
-NodeFilterIterator FindElement(NodeFilterIterator iterator, const Node *end, std::string_view localName,
-                               std::string_view namespaceUri) {
+/// A cursor on the first element of that name from the cursor on. If there is none, on the first that has the local name.
+NodeFilterIterator FindElement(NodeFilterIterator iterator, std::string_view localName, std::string_view namespaceUri) {
   NodeFilterIterator inOtherNamespace = PastTheEnd(iterator);
-  for (; iterator.node != end; iterator.MoveToSibling()) {
+  for (; iterator.node; iterator.MoveToSibling()) {
     if (ElementQNameIs(IteratorToElement(iterator), localName, namespaceUri)) {
       return iterator;
     }
@@ -38,22 +35,16 @@ NodeFilterIterator FindElement(NodeFilterIterator iterator, const Node *end, std
   return inOtherNamespace;
 }
 
-/// A cursor on the element of that name before `iterator`, or past the end.
-NodeFilterIterator FindSkippedElement(const NodeFilterIterator &iterator, std::string_view localName,
-                                      std::string_view namespaceUri) {
-  const NodeFilterIterator first = NodeFilterIterator(iterator.parent, iterator.filter).MoveToChild();
-  return FindElement(first, iterator.node, localName, namespaceUri);
-}
-
 } // namespace
 
 NodeFilterIterator TakeElement(NodeFilterIterator &iterator, std::string_view localName, std::string_view namespaceUri,
                                DeviationSink &sink) {
   NodeFilterIterator taken = iterator;
   if (!RequireElementQName(iterator, localName, namespaceUri, sink)) {
-    taken = FindElement(iterator, nullptr, localName, namespaceUri);
+    taken = FindElement(iterator, localName, namespaceUri);
     if (!taken.node) {
-      return FindSkippedElement(iterator, localName, namespaceUri);
+      const NodeFilterIterator first = NodeFilterIterator(iterator.parent, iterator.filter).MoveToChild();
+      return FindElement(first, localName, namespaceUri);
     }
     while (iterator.node != taken.node) {
       RequireElementQName(iterator.MoveToSibling(), localName, namespaceUri, sink);
@@ -67,7 +58,7 @@ NodeFilterIterator TakeListElement(NodeFilterIterator &iterator, std::string_vie
                                    std::string_view namespaceUri, DeviationSink &sink) {
   const bool isTaken =
       RequireElementQName(iterator, localName, namespaceUri, sink) || HasLocalName(iterator, localName);
-  const NodeFilterIterator taken = isTaken ? iterator : PastTheEnd(iterator);
+  NodeFilterIterator taken = isTaken ? iterator : PastTheEnd(iterator);
   iterator.MoveToSibling();
   return taken;
 }

@@ -95,7 +95,6 @@ public:
   void Refuse(const DateTimeRefusal &refusal) noexcept {
     if (!m_refusal) {
       m_refusal = refusal;
-      m_position = m_text.size();
     }
   }
 

@@ -66,6 +66,15 @@ const std::vector<Ref<KeyInfoResolver>> &Resolvers() {
   return RESOLVERS;
 }
 
+/// Whether a report without refusals shows that everything was checked.
+bool ShowsAllChecks(const SignatureReport &report) {
+  return report.isValueChecked && report.areDigestsComputed &&
+         std::any_of(report.keys.begin(), report.keys.end(),
+                     [](const auto &key) { return key.isUsable && key.madeSignature; }) &&
+         std::all_of(report.references.begin(), report.references.end(),
+                     [](const auto &reference) { return reference.target && reference.digestMatches; });
+}
+
 /// Adds the verdicts on all signatures of a text that parses, after it has compared them with the reports.
 void Compare(const std::string &text, const std::string &name, std::set<std::string> &verdicts) {
   Ref<Document> document;
@@ -82,6 +91,7 @@ void Compare(const std::string &text, const std::string &name, std::set<std::str
       EXPECT_TRUE(std::is_sorted(report.refusals.begin(), report.refusals.end(),
                                  [](const auto &left, const auto &right) { return left.rule < right.rule; }))
           << name;
+      EXPECT_TRUE(verdict != "accepted" || ShowsAllChecks(report)) << name;
       verdicts.insert(verdict);
     }
   }

@@ -153,6 +153,18 @@ TEST(Explain, ShowsWhichKeysCannotBeUsed) {
             RefusalsOf(Explain(ReadDataFile("tokens/ecdsa-p256-sha256.xml"), {"sts-rsa"})));
 }
 
+TEST(Explain, NeverTriesAKeyThatCannotBeUsed) {
+  const std::string text = ReadDataFile("tokens/rsa1024.xml");
+  Explained explained = Explain(text, {"sts-rsa1024"});
+  EXPECT_EQ(Texts{"named "}, KeysOf(explained));
+  EXPECT_FALSE(explained.report.isValueChecked);
+  explained = Explain(text, {"sts-rsa1024", "sts-rsa"});
+  EXPECT_EQ(Texts{UNUSABLE + "an RSA key of 1024 bits\nan RSA key of at least 2048 bits with an odd public exponent of "
+                             "at least 3"},
+            RefusalsOf(explained));
+  EXPECT_EQ((Texts{"named ", "usable "}), KeysOf(explained));
+}
+
 /// A host's own resolver: a function of the KeyInfo.
 class FunctionResolver final : public KeyInfoResolver {
 public:

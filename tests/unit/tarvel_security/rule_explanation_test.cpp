@@ -121,6 +121,15 @@ TEST(Explain, ComputesNoDigestOfNothing) {
   EXPECT_TRUE(explained.report.references.front().digestComputed.empty());
 }
 
+TEST(Explain, ComputesTheDigestOfATargetWithoutTheSignatureIfNoTransformRemovesIt) {
+  const Explained explained = Explain(ReadDataFile("tokens/reference-two.xml"));
+  EXPECT_EQ(Texts(), RefusalsOf(explained));
+  ASSERT_EQ(2u, explained.report.references.size());
+  EXPECT_EQ(&FindElement(*explained.document, "KeyInfo"), explained.report.references[0].target);
+  EXPECT_TRUE(explained.report.references[0].digestMatches);
+  EXPECT_TRUE(explained.report.references[1].digestMatches);
+}
+
 TEST(Explain, ShowsTheWrongDigestOfChangedContent) {
   const Explained explained = ExplainReplaced("alice", "malice");
   const SignatureReport::Reference &reference = explained.report.references.front();

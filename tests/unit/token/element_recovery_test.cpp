@@ -181,6 +181,11 @@ TEST(ConfirmationRecovery, HasNoCertificateWhenItDoesNotDecode) {
   }
 }
 
+TEST(ConfirmationRecovery, ReportsACertificateWithoutTextOnce) {
+  const RecoveredAssertion recovered = RecoverHolderOfKey(HolderCertificateBase64(), "<b/>");
+  EXPECT_EQ((Messages{OnlyText("ds:X509Certificate") + " | ds:X509Certificate"}), recovered.Messages());
+}
+
 TEST(ConditionsRecovery, ReadsTheOtherDate) {
   const RecoveredAssertion recovered = Recover(" NotBefore=\"2026-01-01T00:00:00Z\"", "");
   EXPECT_EQ((Messages{"Node 'saml:Conditions is missing required attribute 'NotBefore' | saml:Conditions"}),

@@ -200,6 +200,17 @@ TEST_F(ExplainSignatureTest, AReferenceToTheDocumentCoversTheToken) {
   EXPECT_EQ("document", report.references.at(0).target);
 }
 
+TEST_F(ExplainSignatureTest, OnlyAReferenceToTheAssertionOrTheDocumentCoversTheToken) {
+  const TokenReport report = Explain(TokenFixture("reference-two"));
+  EXPECT_EQ("", NotPassed(report));
+  ASSERT_EQ(2u, report.references.size());
+  EXPECT_EQ("#_key", report.references[0].uri);
+  EXPECT_TRUE(report.references[0].resolves);
+  EXPECT_FALSE(report.references[0].coversToken);
+  EXPECT_EQ("ds:KeyInfo", report.references[0].target);
+  EXPECT_TRUE(report.references[1].coversToken);
+}
+
 TEST_F(ExplainSignatureTest, WithoutASignatureNothingAboutItIsDone) {
   const TokenReport report = Explain(Attack("unsigned"));
   EXPECT_EQ(

@@ -16,8 +16,10 @@
 
 #include <gtest/gtest.h>
 
+#include <atomic>
 #include <filesystem>
 #include <string>
+#include <thread>
 #include <typeinfo>
 #include <vector>
 
@@ -112,6 +114,25 @@ TEST_F(TokenVerifierTest, KeepsItsKeysAndOptionsWhenItIsCopiedAndTheOriginalIsDe
   const TokenVerifier copy = copyOfTemporary();
   EXPECT_NO_THROW(copy.Verify(TokenFixture("bearer-minimal")));
   EXPECT_THROW(copy.Verify(TokenFixture("bearer")), ParseException);
+}
+
+TEST_F(TokenVerifierTest, ServesSeveralThreadsAtOnce) {
+  const TokenVerifier verifier(TokenCertificates({"other", "sts-rsa-2", "sts-rsa"}));
+  const std::string accepted = TokenFixture("bearer");
+  const std::string refused = TokenFixture("expired");
+  std::atomic<int> right{0};
+  const auto work = [&] {
+    const bool isAccepted = verifier.Verify(accepted)->GetSubject().name == "alice";
+    right += isAccepted && verifier.Explain(accepted).accepted && !verifier.Explain(refused).accepted ? 1 : 0;
+  };
+  std::vector<std::thread> threads;
+  for (int index = 0; index < 4; ++index) {
+    threads.emplace_back(work);
+  }
+  for (std::thread &thread : threads) {
+    thread.join();
+  }
+  EXPECT_EQ(4, right);
 }
 
 TEST_F(TokenVerifierTest, ToleratesAClockThatIsWrongByTheTolerance) {

@@ -31,8 +31,8 @@ struct Taken {
   friend bool operator==(const Taken &, const Taken &) = default;
   friend std::ostream &operator<<(std::ostream &out, const Taken &taken) {
     out << "took " << taken.element << ", next is " << taken.next << ", refused:";
-    for (const std::string &refused : taken.refused) {
-      out << " [" << refused << "]";
+    for (const std::string &found : taken.refused) {
+      out << " [" << found << "]";
     }
     return out;
   }
@@ -80,6 +80,7 @@ TEST(TakeElement, StaysWhenThereIsNoSuchElement) {
 TEST(TakeElement, TakesAnElementOfTheLocalNameInAnotherNamespace) {
   EXPECT_EQ((Taken{"y:e", "x:f", {"element {urn:y}e"}}), TakeFirst("<y:e/><x:f/>"));
   EXPECT_EQ((Taken{"y:e", "the end", {"element x:f", "element {urn:y}e"}}), TakeFirst("<x:f/><y:e/>"));
+  EXPECT_EQ((Taken{"y:e", "e", {"element x:f", "element {urn:y}e"}}), TakeFirst("<x:f/><y:e/><e/>"));
 }
 
 TEST(TakeElement, PrefersTheElementInTheRightNamespace) {

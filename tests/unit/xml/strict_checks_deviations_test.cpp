@@ -71,11 +71,11 @@ TEST(RequireEmptyElement, ReportsWhatIsThereOnce) {
 
 TEST(RequireNoFurtherNode, ReportsEachNodeWithItsPlace) {
   const ParsedDocument document("<r><e/><!-- note -->text <f/></r>");
-  EXPECT_EQ((Deviations{{"too much: 100%1", "e", "", "no further element", "element e"},
-                        {"too much: 100%1", "r", "", "no further element", "text"},
-                        {"too much: 100%1", "f", "", "no further element", "element f"}}),
+  EXPECT_EQ((Deviations{{"too much: 100%%", "e", "", "no further element", "element e"},
+                        {"too much: 100%%", "r", "", "no further element", "text"},
+                        {"too much: 100%%", "f", "", "no further element", "element f"}}),
             DeviationsOf([&](DeviationSink &sink) {
-              RequireNoFurtherNode(document.Cursor().GetChild(), "too much: 100%1", sink);
+              RequireNoFurtherNode(document.Cursor().GetChild(), "too much: 100%%", sink);
             }));
 }
 

@@ -27,7 +27,7 @@ struct SignatureInTree {
 /// Whether the certificate's key can be used with a scheme.
 bool IsUsable(const Crypto::Certificate &certificate, Crypto::SignatureScheme scheme);
 
-/// The usable ones of `candidates`, which may be null. `sink` receives that there is none.
+/// The usable ones of `candidates`, which may be null. If there are none, `sink` receives that.
 Crypto::CertificateList RequireUsableKeys(const SignatureSyntax &syntax, Crypto::SignatureScheme scheme,
                                           Crypto::CertificateList candidates, RefusalSink &sink);
 

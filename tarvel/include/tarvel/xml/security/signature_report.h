@@ -29,25 +29,25 @@ enum class SignatureRule : std::uint8_t {
 struct SignatureReport {
   /// One thing for which the signature is refused.
   struct Refusal {
-    SignatureRule rule = SignatureRule::PROFILE;
+    SignatureRule rule = SignatureRule::PROFILE; ///< the rule that refuses it
     std::string message; ///< the text of the `XmlSecurityException` that `Verify` would throw; empty if
                          ///< `Verify` would return false
     const ElementNode *element = nullptr; ///< where it is; null if there is no place
-    std::string found;                    ///< what is there, shortened as in messages; may be empty
-    std::string wanted;                   ///< what the rule accepts there; may be empty
+    std::string found;  ///< what is there, shortened as in messages; the digest that was computed; may be empty
+    std::string wanted; ///< what the rule accepts there; the digest that the reference wants; may be empty
   };
 
   /// One reference.
   struct Reference {
-    std::string uri;
-    const Node *target = nullptr;        ///< null if it does not resolve to exactly one node
-    std::vector<std::string> transforms; ///< the first ten
-    std::string digestMethod;
-    std::vector<std::uint8_t> digestWanted;
+    std::string uri;                        ///< "" is the document, "#x" the element whose identifier is x
+    const Node *target = nullptr;           ///< null if it does not resolve to exactly one node
+    std::vector<std::string> transforms;    ///< the first ten
+    std::string digestMethod;               ///< URI of the algorithm
+    std::vector<std::uint8_t> digestWanted; ///< the octets of the DigestValue
     /// Empty if it cannot be computed: there is no target, or it does not contain the signature although it should, or an
     /// algorithm is refused, or there is no canonical form.
     std::vector<std::uint8_t> digestComputed;
-    bool digestMatches = false;
+    bool digestMatches = false; ///< the computed digest is the wanted one
   };
 
   /// A key that the resolver trusts.
@@ -66,8 +66,8 @@ struct SignatureReport {
     bool isTrusted = false; ///< byte for byte the certificate of a trusted key
   };
 
-  std::string canonicalizationMethod;
-  std::string signatureMethod;
+  std::string canonicalizationMethod;              ///< URI of the algorithm
+  std::string signatureMethod;                     ///< URI of the algorithm
   std::vector<Reference> references;               ///< the first ten
   std::vector<Key> keys;                           ///< all different ones that the resolver trusts, in order
   std::vector<NamedCertificate> namedCertificates; ///< the first 16 X509Certificate elements that contain only text
