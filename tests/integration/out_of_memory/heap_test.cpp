@@ -172,4 +172,23 @@ TEST(OutOfHeap, NeverLosesPartOfAReport) {
   ExpectWholeReportOrNoMemory(ReadDataFile("attacks/entity-undefined.xml"));
 }
 
+/// The outcome is the report as text.
+std::function<void()> Report(const std::string &xml) {
+  const SsoClient::TokenVerifier verifier(Tarvel::Crypto::LoadCertificates(Testing::DataPath("tokens/sts-rsa.crt")));
+  return [xml, verifier] { throw std::runtime_error(WriteTokenReport(verifier.Explain(xml))); };
+}
+
+TEST(OutOfHeap, NeverChangesAReport) {
+  const Testing::FixedEnvironment clock;
+  for (const std::string name :
+       {"tokens/full.xml", "tokens/expired.xml", "attacks/unsigned.xml", "attacks/not-xml.xml"}) {
+    SCOPED_TRACE(name);
+    const auto report = Report(ReadDataFile(name));
+    FailingHeap none(1'000'000, Shortage::ONCE);
+    const std::string full = OutcomeOf(report, none);
+    ASSERT_EQ("The token is ", full.substr(0, 13));
+    ExpectNothingElse(report, full);
+  }
+}
+
 } // namespace
