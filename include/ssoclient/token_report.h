@@ -142,8 +142,8 @@ struct TokenReport {
     bool isTrusted = false; ///< it is one of the trusted certificates; otherwise it is a stranger's
   };
 
-  /// The maximum number of findings in a report. Further ones are only counted, but each check that failed lists at least
-  /// one.
+  /// The maximum number of findings in a report. Further ones are only counted, and so are those that follow 32 MiB of
+  /// messages, but each check that failed lists at least one.
   static constexpr std::size_t MAX_FINDINGS = 1000;
 
   bool accepted = false; ///< whether `Verify` would return a token; exactly when no check has failed or was not done

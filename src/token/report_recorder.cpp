@@ -17,6 +17,10 @@ using Outcome = TokenReport::Outcome;
 
 constexpr std::size_t CHECKS = static_cast<std::size_t>(Check::REQUIRED_CONFIRMATION) + 1;
 
+// Enough for all texts of a document, each of them in one message. But many messages can contain the same text, such as the
+// URI of a namespace, which has no limit of its own.
+constexpr std::size_t MAX_MESSAGE_BYTES = 32u * 1024 * 1024;
+
 } // namespace
 
 std::string ReportText(std::string_view text) {
@@ -65,7 +69,8 @@ void ReportRecorder::ReplaceFirstRemedy(std::string_view remedy) {
 // One finding is reserved for each check that follows, so that each check that fails lists at least one.
 bool ReportRecorder::IsFull() const noexcept {
   const std::size_t following = CHECKS - 1 - static_cast<std::size_t>(m_current->check);
-  return m_listed >= TokenReport::MAX_FINDINGS - following;
+  const bool areMessagesTooLong = m_messageBytes > MAX_MESSAGE_BYTES && !m_current->findings.empty();
+  return areMessagesTooLong || m_listed >= TokenReport::MAX_FINDINGS - following;
 }
 
 void ReportRecorder::AddAt(const Deviation &deviation, std::uint32_t line, std::uint32_t column) {
@@ -90,6 +95,7 @@ void ReportRecorder::AddAt(const Deviation &deviation, std::uint32_t line, std::
   finding.remedy = ReportText(RemedyFor(m_report, m_current->check, finding));
   m_current->findings.push_back(std::move(finding));
   ++m_listed;
+  m_messageBytes += deviation.message.size();
 }
 
 void ReportRecorder::Count() noexcept {

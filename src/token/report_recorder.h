@@ -61,7 +61,8 @@ private:
   TokenReport &m_report;
   TokenReport::CheckResult *m_current;
   ElementPaths m_paths;
-  std::size_t m_listed = 0; // findings of all checks
+  std::size_t m_listed = 0;       // findings of all checks
+  std::size_t m_messageBytes = 0; // of their messages before they were cut
 };
 
 } // namespace SsoClient

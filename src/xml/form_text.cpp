@@ -2,6 +2,8 @@
 
 #include "xml/form_text.h"
 
+#include <tarvel/core/string_util.h>
+
 #include <array>
 #include <utility>
 
@@ -23,7 +25,8 @@ std::string ShortName(const QNameView &name) {
       return std::string(prefix).append(name.localName);
     }
   }
-  return name.ToString();
+  // Many elements can be in one namespace, whose URI may be as long as the document.
+  return QNameView(Tarvel::StringUtil::Shorten(name.namespaceUri), name.localName).ToString();
 }
 
 std::string ShortName(std::string_view name) {

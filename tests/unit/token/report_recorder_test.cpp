@@ -127,6 +127,22 @@ TEST(ReportRecorder, ListsAllFindingsUpToTheLimit) {
   EXPECT_TRUE(recorder.IsFull());
 }
 
+TEST(ReportRecorder, ListsFewerFindingsIfTheirMessagesAreVeryLongButOneOfEachCheck) {
+  const std::string text(16u * 1024 * 1024, 'x');
+  TokenReport report;
+  ReportRecorder recorder(report);
+  recorder.Begin(Check::FORM);
+  for (int index = 0; index < 10; ++index) {
+    ReportDeviation(recorder, [&text] { return Saying(text); });
+  }
+  recorder.Begin(Check::NAMES);
+  Fill(recorder, 2);
+  EXPECT_EQ(3u, report.Get(Check::FORM).findings.size());
+  EXPECT_EQ(7u, report.Get(Check::FORM).unlistedFindings);
+  EXPECT_EQ(1u, report.Get(Check::NAMES).findings.size());
+  EXPECT_EQ(1u, report.Get(Check::NAMES).unlistedFindings);
+}
+
 TEST(ReportRecorder, ACheckThatWasNotDoneDoesNotPassButMayFail) {
   TokenReport report;
   ReportRecorder recorder(report);

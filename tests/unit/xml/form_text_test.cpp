@@ -30,6 +30,11 @@ TEST(ElementOfName, HasTheUsualPrefixOfItsNamespace) {
   EXPECT_EQ("element e", TextOfElement(""));
 }
 
+TEST(ElementOfName, HasNoMoreThanTheBeginningOfALongNamespace) {
+  const std::string uri(3000, 'u');
+  EXPECT_EQ("element {" + uri.substr(0, 1024) + "... (1976 more bytes)}e", TextOfElement(uri));
+}
+
 TEST(AttributesOfNames, ListsRequiredThenOptionalNames) {
   using Names = AttributesOfNames<std::string_view>;
   EXPECT_EQ("no attributes", MessageFormatter::ASPrint("%1", Names{{}, {}}));
