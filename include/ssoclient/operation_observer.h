@@ -71,8 +71,8 @@ struct OperationEndedEvent {
 /// Texts of the service and of exceptions are printable (`Tarvel::StringUtil::Printable`) and cut at
 /// `Tarvel::StringUtil::MAX_VALUE_BYTES` bytes. In them, "***" replaces each secret of the operation as it is, escaped
 /// for XML and in Base64, and all markup of tokens, signatures and passwords. This may hide more than necessary: a
-/// password of one letter is masked in each word. If there is not enough memory to mask secrets, each text is "***"; if
-/// there is not enough for an event, the event is missing, except "ended", which then has no texts.
+/// password of one letter is masked in each word. If there are too many secrets, or not enough memory, to mask them, each
+/// text is "***"; if there is not enough memory for an event, the event is missing, except "ended", which then has no texts.
 class SSOCLIENT_API OperationObserver {
 public:
   /// An operation has started. Nothing is composed or sent yet.

@@ -18,7 +18,7 @@ using Tarvel::StringUtil;
 
 constexpr std::string_view MASK = "***";
 constexpr std::string_view WHITE_SPACE = " \t\r\n";
-constexpr std::string_view END_OF_NAME = " \t\r\n/>&";
+constexpr std::string_view END_OF_NAME = " \t\r\n/<>&";
 
 /// At the end of a text, at least so many bytes of the beginning of a secret are masked: a service may cut what it
 /// repeats.
@@ -26,6 +26,16 @@ constexpr std::size_t MIN_BEGINNING = 8;
 
 /// The length of overlapping secrets after which the rest of the text is masked, too.
 constexpr std::size_t MAX_OVERLAP_BYTES = std::size_t{1} << 20;
+
+/// The text and some secrets are the service's, which may be hostile: after so many comparisons and equal bytes, the
+/// rest of the text is masked.
+constexpr std::size_t MAX_COMPARISONS = std::size_t{1} << 26;
+
+/// After a tag with a longer name, the rest of the text is masked.
+constexpr std::size_t MAX_NAME_BYTES = 256;
+
+/// With more secrets, each text is masked as a whole.
+constexpr std::size_t MAX_SECRETS = 100;
 
 SecretText WithoutWhiteSpace(std::string_view text) {
   SecretText result;
@@ -118,6 +128,9 @@ std::string_view LocalNameOf(std::string_view name) noexcept {
 /// end of the text; otherwise `begin`.
 std::size_t FindSecretElementEnd(std::string_view text, std::size_t begin) noexcept {
   const std::string_view name = TagName(text.substr(begin));
+  if (name.size() > MAX_NAME_BYTES) {
+    return text.size();
+  }
   if (name.empty() || !IsSecretElement(LocalNameOf(name))) {
     return begin;
   }
@@ -134,6 +147,12 @@ std::size_t FindSecretElementEnd(std::string_view text, std::size_t begin) noexc
     depth += !isWholeName ? 0 : before == '/' ? -1 : before == '<' || before == ';' ? 1 : 0;
   }
   return end;
+}
+
+/// How many bytes at the beginnings of the two texts are equal.
+std::size_t CommonLength(std::string_view one, std::string_view other) noexcept {
+  const std::size_t most = std::min(one.size(), other.size());
+  return static_cast<std::size_t>(std::mismatch(one.begin(), one.begin() + most, other.begin()).first - one.begin());
 }
 
 std::string MissingBytes(std::size_t count) {
@@ -182,9 +201,10 @@ std::string SecretMask::Apply(std::string_view text) const {
     return std::string(text.empty() ? "" : MASK);
   }
   std::string shown;
+  std::size_t comparisons = 0;
   std::size_t at = 0;
   while (at < text.size()) {
-    const std::size_t maskedEnd = FindMaskedEnd(text, at);
+    const std::size_t maskedEnd = FindMaskedEnd(text, at, comparisons);
     const std::size_t end = maskedEnd > at ? maskedEnd : at + CharacterLength(text.substr(at));
     const std::string next = maskedEnd > at ? std::string(MASK) : StringUtil::Printable(text.substr(at, end - at));
     if (shown.size() + next.size() > StringUtil::MAX_VALUE_BYTES) {
@@ -216,48 +236,58 @@ void SecretMask::AddText(std::string_view text) {
 
 void SecretMask::AddSecret(SecretText &&secret) {
   const auto isSame = [&](const SecretText &known) { return known.Get() == secret.Get(); };
-  if (!secret.Get().empty() && std::none_of(m_secrets.begin(), m_secrets.end(), isSame)) {
-    m_secrets.push_back(std::move(secret));
+  if (m_isIncomplete || secret.Get().empty() || std::any_of(m_secrets.begin(), m_secrets.end(), isSame)) {
+    return;
   }
+  if (m_secrets.size() == MAX_SECRETS) {
+    m_isIncomplete = true;
+    return;
+  }
+  m_secrets.push_back(std::move(secret));
 }
 
 /// Adds the values of signatures and negotiations in `xml`, as they are and without line breaks.
 void SecretMask::AddValues(std::string_view xml) {
-  for (std::size_t at = xml.find('<'); at != std::string_view::npos; at = xml.find('<', at + 1)) {
-    const std::string_view name = LocalNameOf(TagName(xml.substr(at)));
+  for (std::size_t at = xml.find('<'); at != std::string_view::npos && !m_isIncomplete;) {
+    const std::size_t next = xml.find('<', at + 1);
+    const std::string_view tagAndText = xml.substr(at, next - at);
+    const std::string_view name = LocalNameOf(TagName(tagAndText));
     if (name == "SignatureValue" || name == "DigestValue" || name == "BinaryExchange") {
-      const std::size_t begin = std::min(xml.find('>', at), xml.size() - 1) + 1;
-      const std::string_view value = xml.substr(begin, xml.find('<', begin) - begin);
+      const std::string_view value = tagAndText.substr(std::min(tagAndText.find('>'), tagAndText.size() - 1) + 1);
       AddSecret(SecretText(value));
       AddSecret(WithoutWhiteSpace(value));
     }
+    at = next;
   }
 }
 
 /// Where a secret that begins at `begin` ends; `begin` if none begins there.
-std::size_t SecretMask::FindSecretEnd(std::string_view text, std::size_t begin) const noexcept {
+std::size_t SecretMask::FindSecretEnd(std::string_view text, std::size_t begin,
+                                      std::size_t &comparisons) const noexcept {
   const std::string_view rest = text.substr(begin);
   std::size_t length = 0;
   for (const SecretText &secret : m_secrets) {
-    const std::string_view value = secret.Get();
-    const bool isBeginning = rest.size() >= MIN_BEGINNING && value.starts_with(rest);
-    if (isBeginning || rest.starts_with(value)) {
-      length = std::max(length, std::min(value.size(), rest.size()));
+    const std::size_t common = CommonLength(rest, secret.Get());
+    comparisons += common + 1;
+    const bool isBeginning = rest.size() >= MIN_BEGINNING && common == rest.size();
+    if (isBeginning || common == secret.Get().size()) {
+      length = std::max(length, common);
     }
   }
   return begin + length;
 }
 
 /// Where the secrets end that begin at `begin` or overlap with one that does; `begin` if none begins there.
-std::size_t SecretMask::FindMaskedEnd(std::string_view text, std::size_t begin) const noexcept {
-  std::size_t end = std::max(FindSecretEnd(text, begin), FindSecretElementEnd(text, begin));
-  for (std::size_t inside = begin + 1; inside < end; ++inside) {
-    if (inside - begin > MAX_OVERLAP_BYTES) {
+std::size_t SecretMask::FindMaskedEnd(std::string_view text, std::size_t begin,
+                                      std::size_t &comparisons) const noexcept {
+  std::size_t end = std::max(FindSecretEnd(text, begin, comparisons), FindSecretElementEnd(text, begin));
+  for (std::size_t inside = begin + 1; inside < end && end < text.size(); ++inside) {
+    if (inside - begin > MAX_OVERLAP_BYTES || comparisons > MAX_COMPARISONS) {
       return text.size();
     }
-    end = std::max(end, FindSecretEnd(text, inside));
+    end = std::max(end, FindSecretEnd(text, inside, comparisons));
   }
-  return end;
+  return comparisons > MAX_COMPARISONS ? text.size() : end;
 }
 
 } // namespace SsoClient

@@ -40,8 +40,9 @@ public:
   /// `text` with "***" in place of secrets, printable (`Tarvel::StringUtil::Printable`), and cut at
   /// `Tarvel::StringUtil::MAX_VALUE_BYTES` bytes, at whose end it then says how many bytes of `text` are missing. A
   /// secret that the end of `text` or the cut would divide is masked, too. So is the markup of a token, a signature or
-  /// a password, whether or not it was added. The time is linear in the length of the text, and mostly far below. If
-  /// there was no memory to add a secret, every text becomes "***".
+  /// a password, whether or not it was added. The time is linear in the length of the text, and mostly far below: where
+  /// a hostile text would need more, the rest of it is masked. If there was no memory to add a secret, or there are more
+  /// than 100, every text becomes "***".
   std::string Apply(std::string_view text) const;
 
 private:
@@ -50,8 +51,8 @@ private:
   void AddText(std::string_view text);
   void AddSecret(Tarvel::SecretText &&secret);
   void AddValues(std::string_view xml);
-  std::size_t FindSecretEnd(std::string_view text, std::size_t begin) const noexcept;
-  std::size_t FindMaskedEnd(std::string_view text, std::size_t begin) const noexcept;
+  std::size_t FindSecretEnd(std::string_view text, std::size_t begin, std::size_t &comparisons) const noexcept;
+  std::size_t FindMaskedEnd(std::string_view text, std::size_t begin, std::size_t &comparisons) const noexcept;
 
   std::vector<Tarvel::SecretText> m_secrets; // none is empty
   bool m_isIncomplete = false;

@@ -180,5 +180,65 @@ TEST(SecretMask, EndsInLinearTimeForHostileTexts) {
   EXPECT_LE(Masked("secret", names).size(), 2000u);
 }
 
+TEST(SecretMask, EndsSoonForMarkupThatHasNoNames) {
+  const std::string text(10000000, '<');
+  EXPECT_EQ(Masked("wonderland", text), std::string(1024, '<') + "... (9998976 more bytes)");
+}
+
+TEST(SecretMask, MasksTheRestAfterATagWhoseNameIsTooLong) {
+  const std::string name(256, 'n');
+  EXPECT_EQ(Masked("wonderland", "<" + name + "> text"), "<" + name + "> text");
+  EXPECT_EQ(Masked("wonderland", "a <" + name + "n> text"), "a ***");
+}
+
+TEST(SecretMask, EndsSoonForANameThatRepeatsItself) {
+  const std::string half(5000000, 'a');
+  EXPECT_EQ(Masked("wonderland", "<" + half + ":Password " + half), "***");
+}
+
+TEST(SecretMask, FindsTheEndOfATagWithoutABlank) {
+  EXPECT_EQ(Masked("wonderland", "<a<Password>w</Password> b"), "<a***> b");
+}
+
+TEST(SecretMask, AddsTheValuesOfATokenInLinearTime) {
+  std::string inInstruction;
+  while (inInstruction.size() < 10000000) {
+    inInstruction += "<DigestValue ";
+  }
+  SecretMask mask;
+  mask.AddToken("<a><?p " + std::string(10000000, '<') + inInstruction + "?><DigestValue>abcd</DigestValue></a>");
+  EXPECT_EQ(mask.Apply("digest abcd, other abce"), "digest ***, other abce");
+}
+
+TEST(SecretMask, MasksEveryTextAfterTooManySecrets) {
+  std::string token = "<a>";
+  for (int i = 0; i < 99; ++i) {
+    token += "<DigestValue>" + std::to_string(1000 + i) + "</DigestValue>";
+  }
+  SecretMask mask;
+  mask.AddToken(token); // itself, and 99 values
+  EXPECT_EQ(mask.Apply("1000 1098 text"), "*** *** text");
+  mask.AddToken("<a/>");
+  EXPECT_EQ(mask.Apply("text"), "***");
+}
+
+TEST(SecretMask, AddsAnyNumberOfValuesInLinearTime) {
+  std::string token = "<a>";
+  for (int i = 0; i < 500000; ++i) {
+    token += "<DigestValue>" + std::to_string(i) + "</DigestValue>";
+  }
+  SecretMask mask;
+  mask.AddToken(token);
+  EXPECT_EQ(mask.Apply("text"), "***");
+}
+
+TEST(SecretMask, MasksTheRestOfATextThatNeedsTooManyComparisons) {
+  const std::vector<std::uint8_t> zeros(3000000); // four million letters A in Base64
+  SecretMask mask;
+  mask.AddLeg(zeros);
+  EXPECT_EQ(mask.Apply(std::string(9000000, 'A') + " text"), "***");
+  EXPECT_EQ(mask.Apply(std::string(3999999, 'A') + " text"), "AAAAAAAAAAAAAAAA***");
+}
+
 } // namespace
 } // namespace SsoClient
