@@ -20,12 +20,11 @@ constexpr std::string_view MASK = "***";
 constexpr std::string_view WHITE_SPACE = " \t\r\n";
 constexpr std::string_view END_OF_NAME = " \t\r\n/>&";
 
-/// At the end of a text, at least so many bytes of the beginning of a secret are masked: a service may cut what it
-/// repeats.
+/// A service may cut what it repeats. So the beginning of a secret is masked at the end of a text, too, if it has at
+/// least this number of bytes.
 constexpr std::size_t MIN_BEGINNING = 8;
 
-/// The number of bytes after which secrets that overlap are not told apart any more, and the rest of the text is
-/// masked.
+/// If secrets that overlap cover more than this number of bytes, the rest of the text is masked.
 constexpr std::size_t MAX_OVERLAP_BYTES = std::size_t{1} << 20;
 
 SecretText WithoutWhiteSpace(std::string_view text) {
@@ -162,7 +161,7 @@ void SecretMask::AddToken(const SamlToken &token) noexcept {
 
 void SecretMask::AddToken(const std::string &tokenXml) noexcept {
   Guard([&] {
-    AddSecret(SecretText(tokenXml)); // escaped, it is masked because of its markup
+    AddSecret(SecretText(tokenXml)); // an escaped token is masked because of its markup
     AddValues(tokenXml);
   });
 }
@@ -249,7 +248,7 @@ std::size_t SecretMask::FindSecretEnd(std::string_view text, std::size_t begin) 
   return begin + length;
 }
 
-/// Where the secrets end that begin at `begin` or overlap with one that does; `begin` if none begins there.
+/// The end of the secret that begins at `begin`, and of those that overlap with it; `begin` if none begins there.
 std::size_t SecretMask::FindMaskedEnd(std::string_view text, std::size_t begin) const noexcept {
   std::size_t end = std::max(FindSecretEnd(text, begin), FindSecretElementEnd(text, begin));
   for (std::size_t inside = begin + 1; inside < end; ++inside) {
