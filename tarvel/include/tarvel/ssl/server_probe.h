@@ -39,16 +39,16 @@ struct ServerRefusal {
   };
 
   Kind kind = Kind::OTHER;
-  std::string text;      ///< in the words of an `SSLException`, without the endpoint
+  std::string text;      ///< the reason as in an `SSLException`, without the endpoint
   std::size_t depth = 0; ///< of the certificate in the chain that was verified; 0 is the server's
 
-  /// That certificate, which need not be one of those that the server sent. Null for one that cannot be read, and for
-  /// `OTHER_THUMBPRINT`.
+  /// The certificate at that depth, which need not be one of those that the server sent. Null if it cannot be read, and
+  /// for `OTHER_THUMBPRINT`.
   Ref<const Crypto::Certificate> certificate;
 };
 
-/// What a TLS handshake has shown. All texts and certificates are the server's, and nothing of them is verified unless
-/// the server was accepted.
+/// What a TLS handshake has shown. The certificates are as the server sent them, and not verified unless the server was
+/// accepted.
 struct HandshakeProbe {
   /// How the handshake ended.
   enum class Outcome : std::int32_t {
@@ -63,20 +63,20 @@ struct HandshakeProbe {
   };
 
   Outcome outcome = Outcome::FAILED;
-  std::string failure; ///< the message of the exception that a connection gets; empty if the server was accepted
+  std::string failure; ///< the message with which a connection would fail; empty if the server was accepted
   std::int64_t durationMicroseconds = 0;
   std::string version; ///< such as "TLSv1.3"; empty if none was agreed on
   std::string cipher;  ///< the cipher suite's name; empty if none was agreed on
 
-  /// The certificates that the server sent, its own first. Null for one that cannot be read.
+  /// The certificates that the server sent, its own first. Null for a certificate that cannot be read.
   Crypto::CertificateList chain;
-  std::size_t chainLength = 0; ///< how many the server sent, also those that were not kept
+  std::size_t chainLength = 0; ///< how many the server sent, including those that were not kept
 
-  /// The trusted certificate at which the chain ends; null when it ends at none, and when a thumbprint replaced the
-  /// check of the chain.
+  /// The trusted certificate at which the chain ends. Null if there is none, and if a thumbprint replaced the check of
+  /// the chain.
   Ref<const Crypto::Certificate> anchor;
 
-  /// Every reason, in the order in which they were found: the first one is the one in `failure`.
+  /// The reasons to refuse the server, in the order in which they were found. `failure` contains the first.
   std::vector<ServerRefusal> refusals;
 };
 
@@ -100,7 +100,7 @@ struct AddressProbe {
 struct ServerProbe {
   std::string lookupFailure; ///< why the name has no address; empty if it has
   std::int64_t lookupMicroseconds = 0;
-  std::size_t addressCount = 0;        ///< how many addresses the name has, also those that were not tried
+  std::size_t addressCount = 0;        ///< how many addresses the name has, including those that were not tried
   std::vector<AddressProbe> addresses; ///< in the order in which a connection tries them
 
   /// The handshake with the first address that answered; `boost::none` when none answered, and without a context.
@@ -108,17 +108,18 @@ struct ServerProbe {
 };
 
 /// Looks up `host`, connects to each of its addresses, and performs a TLS handshake with the first that answers. The
-/// same code as for every other connection decides whether the server is accepted, but here it goes on after the first
-/// reason against a certificate, and notes each. The connection is closed after the handshake, whether or not the server
-/// was accepted; nothing else is sent. No session is resumed. Blocks the calling thread, which must not be an I/O thread.
+/// same code as for every other connection decides whether the server is accepted, but here it continues after the
+/// first reason to refuse a certificate, and records each. The connection is closed after the handshake, whether or not
+/// the server was accepted; nothing else is sent. No session is resumed. The call blocks the thread, which must not be
+/// an I/O thread.
 /// @param host as in `System::TcpClientSocket::AsyncConnect`.
 /// @param port 1 to 65535.
 /// @param context what to trust, made by `CreateSSLContext`; null to perform no handshake.
 /// @param parameter as in `SSLStream::AsyncHandshake`.
 /// @param timeoutMicroseconds for each of the three steps.
 /// @throws TypeMismatchException for a context of another class. @throws InvalidStateException when there are no threads
-///         or descriptors, and when OpenSSL has cleaned itself up. @throws OutOfMemoryException. What is wrong with the
-///         server is never an exception.
+///         or descriptors, and when OpenSSL has cleaned itself up. @throws OutOfMemoryException. A problem of the
+///         server is part of the result, and never an exception.
 TARVEL_API ServerProbe ProbeServer(const std::string &host, int port, const Ref<SSLContext> &context,
                                    const std::string &parameter, std::int64_t timeoutMicroseconds);
 
