@@ -45,7 +45,7 @@ void WriteObserverFailure(const char *function, const char *text) noexcept {
     LogInternal(getLogger(), LOG_LEVEL_CONTRACT_WARNING, "The negotiation observer's %1 threw: %2",
                 std::string(function), std::string(text));
   } catch (...) {
-    // Without memory the line is lost, but the negotiation goes on. NOLINT(bugprone-empty-catch)
+    // Without memory the line is lost, but the negotiation continues. NOLINT(bugprone-empty-catch)
   }
 }
 

@@ -16,9 +16,9 @@
 
 namespace SsoClient {
 
-/// Parses, checks and verifies the SAML 2.0 assertion in `xml`. The token's `ToXml` is `xml`, byte for byte. The trusted keys are
-/// prepared anew in each call: to verify many tokens, to check their audience or to learn why one is refused, use a
-/// `TokenVerifier`.
+/// Parses, checks and verifies the SAML 2.0 assertion in `xml`. The token's `ToXml` is `xml`, byte for byte. Each call
+/// prepares the trusted keys again. Use a `TokenVerifier` to verify many tokens, to check their audience, or to learn
+/// why a token is refused.
 /// @param trustedCertificates the certificates whose keys may have signed the token. The key is what is trusted: the
 ///        validity dates of the certificates are not checked. A null reference in the list is ignored.
 /// @param clockToleranceSec how far this machine's clock may be wrong, in seconds. A negative tolerance shortens the time

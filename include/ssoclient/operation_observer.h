@@ -50,17 +50,17 @@ struct OperationEndedEvent {
   enum class Outcome : std::int32_t { SUCCEEDED = 0, FAILED };
 
   Outcome outcome = Outcome::SUCCEEDED; ///< whether the operation returned a result or threw an exception
-  /// The unqualified name of the failure's class. It and the message are empty if the operation succeeded, and if it
-  /// failed and there was no memory for them.
+  /// The name of the exception's class, without namespaces. This name and the message are empty if the operation
+  /// succeeded, and if there was no memory for them.
   std::string exceptionClass;
-  std::string message;                   ///< the failure's text
+  std::string message;                   ///< the exception's text
   std::int64_t durationMicroseconds = 0; ///< since the operation started
 };
 
 /// The caller implements the functions that it needs; the others do nothing. The thread that runs the operation calls
 /// them. Operations run on several threads at once, so the functions must be safe on any thread. They must not block,
-/// since the operation waits for them, and must not throw: what they throw is written to the log (logger "SsoClient",
-/// level 8) and changes nothing else.
+/// because the operation waits for them. They must not throw: what they throw is written to the log (logger
+/// "SsoClient", level 8) and changes nothing else.
 ///
 /// The events of one operation arrive in this order: started; for each message request sent, response received, and a
 /// fault if the response is one; ended. There is exactly one "ended" for each "started", also after a failure.
@@ -75,7 +75,7 @@ struct OperationEndedEvent {
 /// text is "***"; if there is not enough memory for an event, the event is missing, except "ended", which then has no texts.
 class SSOCLIENT_API OperationObserver {
 public:
-  /// An operation has started. Nothing is composed or sent yet.
+  /// An operation has started. No request has been composed or sent yet.
   virtual void OnStarted(const OperationInfo &operation);
   /// A request is about to be sent.
   virtual void OnRequestSent(const OperationInfo &operation, const RequestSentEvent &event);

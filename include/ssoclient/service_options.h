@@ -15,12 +15,12 @@ namespace SsoClient {
 
 /// Options of a service. Without options a service works as if all of them had their defaults.
 struct ServiceOptions {
-  /// Gets the text of a token that the service issued and this client refused, before the operation throws. Called on the thread
-  /// that runs the operation. **The text may be a usable bearer token for another program, so it is secret.** What the
-  /// function throws is written to the log and changes nothing else.
+  /// Receives the text of a token that the service issued and this client refused, before the operation throws. It is
+  /// called on the thread that runs the operation. **The text may be a usable bearer token for another program, so it
+  /// is secret.** What the function throws is written to the log and changes nothing else.
   using RefusedTokenSink = std::function<void(const std::string &tokenXml)>;
 
-  /// How the tokens that come back are verified.
+  /// How the tokens that the service returns are verified.
   VerifyOptions verifyOptions;
 
   /// Follows the operations; null for none. Shared until the service and its operations are released.

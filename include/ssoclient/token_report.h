@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// `TokenReport`, what each check of a token looked at, wanted and found.
+/// `TokenReport`, what each check of a token examined, expected and found.
 
 #pragma once
 
@@ -23,9 +23,10 @@
 
 namespace SsoClient {
 
-/// What an assertion says about itself. **Nothing of this is verified, even if the report says that the token is accepted**:
-/// use `TokenVerifier::Verify` to get a token. An empty optional means that the text does not say it, or not in a form that
-/// can be read. Texts are as the sender wrote them, so they may contain control characters.
+/// What an assertion says about itself. **None of this is verified, even if the report says that the token is
+/// accepted**: use `TokenVerifier::Verify` to get a token. An optional is empty if the text does not contain the value,
+/// or contains it in a form that cannot be read. Texts are as the sender wrote them, so they may contain control
+/// characters.
 struct UnverifiedClaims {
   /// Whether the text contains an assertion, also of another version than SAML 2.0; if not, nothing else is set.
   bool isAssertion = false;
@@ -53,8 +54,8 @@ struct UnverifiedClaims {
   std::string certificateThumbprint;
 };
 
-/// Why a token is accepted or refused: each check of the verification with its outcome. A check is reported also when an
-/// earlier one has failed.
+/// Why a token is accepted or refused: each check of the verification with its outcome. Every check is reported, even
+/// if an earlier one failed.
 ///
 /// All texts except `refusal` and `claims` are printable: characters that could control a terminal are written as \\uXXXX
 /// (`Tarvel::StringUtil::Printable`), and a text is cut at `Tarvel::StringUtil::MAX_VALUE_BYTES`. A report contains names of
@@ -70,7 +71,7 @@ struct TokenReport {
     DELEGATION,      ///< the delegate of the confirmation is the last delegate of the restriction
     ALGORITHMS,      ///< the signature uses only accepted algorithms, transforms and parts
     KEYS,            ///< a trusted key can be used with the signature's algorithm
-    REFERENCES,      ///< each reference resolves to exactly one node, and envelops the signature if it says so
+    REFERENCES,      ///< each reference resolves to one node, which contains the signature if it is enveloped
     SIGNATURE,       ///< a trusted key made the signature
     DIGESTS,         ///< the digest of each reference is the one that was signed
     NAMES,           ///< subject, groups, delegates and attributes can be read
@@ -82,21 +83,21 @@ struct TokenReport {
   enum class Outcome : std::int32_t {
     PASSED = 0,
     FAILED,  ///< there is at least one finding
-    NOT_DONE ///< what the check needs is not there, because an earlier check failed; `summary` says what is missing
+    NOT_DONE ///< an earlier check failed, so something that this check needs is missing: see `summary`
   };
 
-  /// One thing for which a token is refused.
+  /// One reason to refuse a token.
   struct Finding {
-    std::string message;   ///< the text of the exception with which `Verify` would refuse it
+    std::string message;   ///< the text of the exception that `Verify` would throw for this reason
     std::string element;   ///< the name of the element as written; empty if the finding has no place
     std::string attribute; ///< the name of the attribute; empty if the finding is about the element
-    /// From the topmost element to the element, such as "/saml2:Assertion/saml2:Subject"; "[n]" after a name means the
-    /// n-th element of that name under its parent, and "[?]" one with too many nodes before it to count them.
+    /// From the topmost element to the element, such as "/saml2:Assertion/saml2:Subject". "[n]" after a name means the
+    /// n-th element of that name under its parent, and "[?]" that too many nodes are before the element to count them.
     std::string path;
     std::uint32_t line = 0;   ///< of the element's start tag, or of the error in the text; from 1; 0: unknown
     std::uint32_t column = 0; ///< from 1, in bytes; 0: unknown
-    std::string wanted;       ///< what is allowed or expected there; may be empty
-    std::string found;        ///< what is there; may be empty
+    std::string wanted;       ///< what is allowed or expected at this place; may be empty
+    std::string found;        ///< what is at this place; may be empty
     /// By how many seconds, rounded up, this machine's clock is outside the validity period with its tolerance; 0 for
     /// findings that are not about the clock.
     std::int64_t missedBySec = 0;
@@ -107,8 +108,8 @@ struct TokenReport {
   struct CheckResult {
     Check check = Check::WELL_FORMED;    ///< which check
     Outcome outcome = Outcome::NOT_DONE; ///< its outcome
-    std::string summary;                 ///< what was looked at and found, in one sentence
-    std::vector<Finding> findings;       ///< in the order in which the verification meets them; empty unless FAILED
+    std::string summary;                 ///< what was checked and found, in one sentence
+    std::vector<Finding> findings;       ///< in the order in which the verification finds them; empty unless FAILED
     std::size_t unlistedFindings = 0;    ///< further findings that are left out because of `MAX_FINDINGS`
   };
 
@@ -120,8 +121,8 @@ struct TokenReport {
     std::string target;                  ///< the name of the target element; "document" for the whole document
     std::vector<std::string> transforms; ///< their algorithms, in order
     std::string digestMethod;            ///< its algorithm
-    std::string digestWanted;            ///< as the signature has it, in Base64
-    std::string digestComputed;          ///< in Base64; empty if it cannot be computed
+    std::string digestWanted;            ///< the digest that the signature contains, in Base64
+    std::string digestComputed;          ///< of the target, in Base64; empty if it cannot be computed
     bool digestMatches = false;          ///< whether the two digests are the same
   };
 
@@ -129,29 +130,29 @@ struct TokenReport {
   struct TrustedKey {
     Tarvel::Ref<const Tarvel::Crypto::Certificate> certificate; ///< never null; one of those that the verifier trusts
     std::string subject;                                        ///< of the certificate; empty if it cannot be read
-    std::string thumbprint;                                     ///< SHA-256, as `Certificate::GetSha256Thumbprint`
+    std::string thumbprint;                                     ///< from `Certificate::GetSha256Thumbprint`
     bool isNamed = false;                                       ///< the signature's `KeyInfo` contains this certificate
     bool isUsable = false;                                      ///< it can be used with the signature's algorithm
     bool madeSignature = false;                                 ///< it made the signature
   };
 
-  /// A certificate in the signature's `KeyInfo`. It is shown only; it never becomes a key.
+  /// A certificate in the signature's `KeyInfo`. It is only shown, and never used to verify the signature.
   struct NamedCertificate {
     std::string subject;    ///< empty if it cannot be read
     std::string thumbprint; ///< SHA-256; empty if it cannot be read
-    bool isTrusted = false; ///< it is one of the trusted certificates; otherwise it is a stranger's
+    bool isTrusted = false; ///< whether it is one of the trusted certificates
   };
 
   /// The maximum number of findings in a report. Further ones are only counted, and so are those that follow 32 MiB of
   /// messages, but each check that failed lists at least one.
   static constexpr std::size_t MAX_FINDINGS = 1000;
 
-  bool accepted = false; ///< whether `Verify` would return a token; exactly when no check has failed or was not done
-  /// The text of the exception that `Verify` throws, exactly, so it may contain control characters; empty if accepted.
+  bool accepted = false; ///< whether `Verify` would return a token; true exactly when every check passed
+  /// The exact text of the exception that `Verify` throws. It may contain control characters. Empty if accepted.
   std::string refusal;
   std::vector<CheckResult> checks;                 ///< all checks, in order
   std::string signatureAlgorithm;                  ///< its URI; empty if there is no signature that can be read
-  std::string canonicalization;                    ///< the algorithm of `SignedInfo`; empty as above
+  std::string canonicalization;                    ///< the algorithm's URI for `SignedInfo`; empty in the same case
   std::vector<Reference> references;               ///< at most ten
   std::vector<TrustedKey> trustedKeys;             ///< in the order in which they are trusted
   std::vector<NamedCertificate> namedCertificates; ///< at most 16
@@ -172,8 +173,9 @@ SSOCLIENT_API const char *GetCheckName(TokenReport::Check check) noexcept;
 /// The name of an outcome: "passed", "failed" or "not done".
 SSOCLIENT_API const char *GetOutcomeName(TokenReport::Outcome outcome) noexcept;
 
-/// `report` as text for a log or a person: a line with the verdict, one for each check, and below it a few for each finding.
-/// Without `claims`, which are not verified. Printable except for its line ends, the last of which is at its end.
+/// `report` as text for a log or a person: a line with the verdict, a line for each check, and below it a few lines for
+/// each finding. The text does not contain `claims`, because they are not verified. It is printable except for its line
+/// ends, and ends with one.
 SSOCLIENT_API std::string WriteTokenReport(const TokenReport &report);
 
 } // namespace SsoClient

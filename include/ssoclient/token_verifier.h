@@ -29,7 +29,7 @@ public:
   /// Parses, checks and verifies the SAML 2.0 assertion in `xml`. The token's `ToXml` is `xml`, byte for byte.
   /// @throws Tarvel::Xml::XMLParseException when `xml` is not a well-formed document.
   /// @throws ParseException when it is not an assertion of the accepted form, is inconsistent, expired or not valid yet,
-  ///         and when it does not have the audience or the confirmation that the options demand.
+  ///         and when it does not have the audience or the confirmation that the options require.
   /// @throws InvalidSignatureException when none of the trusted keys made its signature; when the token was changed
   ///         after it was signed; when the signature is outside the accepted profile; and when the trusted key is not
   ///         accepted (`CreateSamlToken` lists the cases).
@@ -43,17 +43,18 @@ public:
   /// @throws Tarvel::Xml::Security::XmlSecurityException when the element has no canonical form.
   std::shared_ptr<const SamlToken> Verify(const Tarvel::Xml::ElementNode &element) const;
 
-  /// Runs the checks of `Verify` on `xml`, goes on after a failure, and reports each check. `accepted` is true exactly
-  /// when `Verify` returns a token at the same moment. Nothing in the report may be trusted: it is not a token. If `xml`
-  /// is well-formed but its document element is not an assertion, the report also shows the first assertion in it, and
-  /// does not accept it. It takes linear time, but more than `Verify`, for example because it computes the digests even if
-  /// no trusted key made the signature. Call it when a person wants to know why a token is refused, not for each token.
+  /// Runs the checks of `Verify` on `xml`, continues after a failure, and reports each check. `accepted` is true
+  /// exactly when `Verify` returns a token at the same moment. Nothing in the report may be trusted: it is not a token.
+  /// If `xml` is well-formed but its document element is not an assertion, the report also shows the first assertion in
+  /// it, and does not accept it. A call takes linear time, but more than `Verify`, for example because it computes the
+  /// digests even if no trusted key made the signature. Call it when a person wants to know why a token is refused, not
+  /// for each token.
   /// @throws Tarvel::OutOfMemoryException, std::bad_alloc and Tarvel::InvalidStateException like `Verify`, and nothing else:
   ///         no text in `xml` makes it throw.
   TokenReport Explain(const std::string &xml) const;
 
-  /// The same for an element that is parsed already. If the element has no canonical form, the check WELL_FORMED fails. The tree
-  /// must not be changed during the call; the report does not keep a reference to it.
+  /// The same for an element that is parsed already. If the element has no canonical form, the check WELL_FORMED fails.
+  /// The tree must not be changed during the call; the report does not keep a reference to it.
   TokenReport Explain(const Tarvel::Xml::ElementNode &element) const;
 
 private:

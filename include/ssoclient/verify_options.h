@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// `VerifyOptions`, what a relying party demands of a token apart from a valid signature.
+/// `VerifyOptions`, what a relying party requires of a token in addition to a valid signature.
 
 #pragma once
 

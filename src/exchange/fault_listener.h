@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// `FaultListener`, which is shown the SOAP fault of a response before the fault becomes an exception.
+/// `FaultListener`, which receives the SOAP fault of a response before the fault becomes an exception.
 
 #pragma once
 
@@ -8,10 +8,10 @@
 
 namespace SsoClient {
 
-/// Belongs to one operation, and is called on the operation's thread.
+/// A listener belongs to one operation, and is called on the operation's thread.
 class FaultListener {
 public:
-  /// The response is a fault. It throws nothing, because the fault's own exception comes next.
+  /// The response is a fault. The function does not throw, because the fault's own exception is thrown next.
   virtual void OnFault(const Tarvel::Xml::ElementNode &fault) noexcept = 0;
 
 protected:

@@ -30,7 +30,7 @@ struct Request {
   std::string soapAction; ///< value of the `SOAPAction` HTTP header, without quotes
   std::string body;       ///< the whole envelope; secret
 
-  /// Where the transport puts the facts of the response. Null, the default, if nobody wants to know them.
+  /// Where the transport writes the facts of the response. Null, the default, if the caller does not need them.
   std::shared_ptr<ResponseFacts> facts;
 };
 

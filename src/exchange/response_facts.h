@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// `ResponseFacts`, what the transport knows of a response apart from its body.
+/// `ResponseFacts`, what the transport reports about a response in addition to its body.
 
 #pragma once
 

@@ -32,8 +32,8 @@ public:
   /// Sets all fields of `spnego` to the service's response to one leg of a negotiation.
   virtual void HandleSPNegoResponse(Tarvel::Reader *response, SPNegoResponse &spnego) const = 0;
 
-  /// A handler that does the same, and also shows each fault to `listener`, which must outlive it. Null if this handler
-  /// cannot do that.
+  /// A handler that does the same, and also passes each fault to `listener`, which must outlive the returned handler.
+  /// Null if this class has no such handler.
   virtual std::shared_ptr<const ResponseHandler> WithFaultListener(FaultListener &listener) const {
     static_cast<void>(listener);
     return nullptr;

@@ -19,7 +19,7 @@ namespace SsoClient {
 /// - `Tarvel::Xml::Security::XmlSecurityException` for an assertion that has no canonical form.
 class ResponseHandlerImpl final : public ResponseHandler {
 public:
-  /// @param listener is shown each fault; null for none. It must outlive the handler.
+  /// @param listener receives each fault; null for none. It must outlive the handler.
   explicit ResponseHandlerImpl(FaultListener *listener = nullptr) noexcept : m_listener(listener) {}
 
   void HandleAcquireTokenResponse(Tarvel::Reader *response, std::string &tokenXml) const override;

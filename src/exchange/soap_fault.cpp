@@ -20,7 +20,8 @@ using Tarvel::Xml::TextNode;
 
 constexpr std::string_view WHITE_SPACE = " \t\r\n";
 
-/// The names of the elements whose content is never shown. Each name that begins with "Signature" is one, too.
+/// The names of elements with content that is never shown. Names that begin with "Signature" are treated in the same
+/// way.
 constexpr std::string_view SECRET_ELEMENTS[] = {"Assertion",    "EncryptedData",       "EncryptedAssertion",
                                                 "CipherValue",  "BinarySecurityToken", "BinaryExchange",
                                                 "BinarySecret", "DigestValue",         "Password"};
@@ -41,8 +42,8 @@ std::string_view NamespaceOf(const ElementNode *element, std::string_view code) 
   return namespaceUri;
 }
 
-/// The node after `node` in document order within `top`, without the nodes below `node` unless `enters`; null after the
-/// last one.
+/// The node after `node` in document order within `top`; null after the last one. The nodes below `node` are skipped
+/// unless `enters`.
 const Node *NextNode(const Node *node, const Node *top, bool enters) noexcept {
   if (enters && node->GetFirstChild()) {
     return node->GetFirstChild();

@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// `SoapFault`, what a SOAP 1.1 fault says, for those who follow an operation.
+/// `SoapFault`, the texts of a SOAP 1.1 fault, for the observer of an operation.
 
 #pragma once
 
@@ -20,8 +20,8 @@ struct SoapFault {
   std::string detail;             ///< the texts in the `detail` element that may be shown, with blanks between them
 };
 
-/// Reads the children of the `Fault` element. Whatever is missing is empty. The time is linear in the length of the
-/// fault.
+/// Reads the children of the `Fault` element. The text of a missing child is empty. The time is linear in the length of
+/// the fault.
 SoapFault ReadSoapFault(const Tarvel::Xml::ElementNode &fault);
 
 /// Whether the content of an element with this local name is never shown: a token, a signature, a key or a password.

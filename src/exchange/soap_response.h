@@ -21,7 +21,7 @@ namespace SsoClient {
 Tarvel::Ref<const Tarvel::Xml::ElementNode> ParseResponseDocument(Tarvel::Reader &response);
 
 /// Checks that there is no SOAP 1.1 fault in the body of `envelope`.
-/// @param listener is shown the fault before the exception is thrown; null for none
+/// @param listener receives the fault before the exception is thrown; null for none
 /// @throws InvalidCredentialsException for a fault that says that authentication failed.
 /// @throws SsoException for every other fault.
 /// @throws ParseException for a fault code whose prefix is not bound.

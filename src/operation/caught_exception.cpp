@@ -45,7 +45,7 @@ std::string ClassNameOf(const std::type_info *type) {
   const std::unique_ptr<char, void (*)(void *)> demangled(abi::__cxa_demangle(type->name(), nullptr, nullptr, &status),
                                                           std::free);
   if (!demangled) {
-    throw std::bad_alloc(); // every name of a type is valid
+    throw std::bad_alloc(); // the only possible reason, because the name of a type is valid
   }
   const std::string_view name = demangled.get();
   const std::string_view outer = name.substr(0, name.find('<'));
@@ -64,7 +64,7 @@ void LogCaughtException(const std::string &id, const char *subject, const Secret
     LogInternal(getLogger(), LOG_LEVEL_CONTRACT_WARNING, "%1%2 threw %3%4", opId, std::string(subject),
                 caught.className, message);
   } catch (...) {
-    // Without memory the line is lost, but the operation goes on. NOLINT(bugprone-empty-catch)
+    // Without memory the line is lost, but the operation continues. NOLINT(bugprone-empty-catch)
   }
 }
 

@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// The exception that is being handled: its class as text, and the log line for one that goes no further.
+/// The exception that is being handled: its class as text, and the log line for an exception that is not rethrown.
 
 #pragma once
 
@@ -19,7 +19,7 @@ std::string ClassNameOf(const std::type_info *type);
 
 /// Writes that `subject`, such as "The observer's OnFault", threw the exception that is being handled. The line
 /// contains no secret of `mask`.
-/// @param id of the operation, with which the line begins; may be empty
+/// @param id the operation's identifier, which begins the line; may be empty
 void LogCaughtException(const std::string &id, const char *subject, const SecretMask &mask) noexcept;
 
 } // namespace SsoClient

@@ -84,7 +84,7 @@ void OperationEvents::OnFault(const Tarvel::Xml::ElementNode &fault) noexcept {
     FaultEvent event;
     event.codeNamespace = m_mask.Apply(read.codeNamespace);
     event.code = m_mask.Apply(read.code);
-    // Divided after it was masked, because the colon may be a part of a secret.
+    // The code is divided after masking, because the colon may be a part of a secret.
     event.codeName = event.code.substr(event.code.find(':') + 1);
     m_mask.AddPrefixOf(read.code, event.code);
     event.text = m_mask.Apply(read.text);
@@ -121,7 +121,7 @@ void OperationEvents::ReportSent(Request &request) noexcept {
 
 void OperationEvents::ReportReceived(const ResponseFacts *facts, const char *failure, Clock::time_point sent) noexcept {
   if (!facts) {
-    return; // there was no memory for them, so nothing is known of the response
+    return; // there was no memory for the facts, so nothing is known about the response
   }
   Report("The observer's OnResponseReceived", [&] {
     ResponseReceivedEvent event;

@@ -30,10 +30,10 @@
 namespace SsoClient {
 
 /// The events of one operation. Without an observer, nothing is computed and no memory is used. What the observer
-/// throws is logged, and so is a lack of memory for an event; neither changes the operation. For one thread.
+/// throws is logged, and so is a lack of memory for an event; neither changes the operation. Used by one thread.
 class OperationEvents final : public FaultListener {
 public:
-  /// Not observed.
+  /// The events of an operation that is not observed.
   OperationEvents() noexcept : m_observer(nullptr), m_id(m_operation.id) {}
 
   /// Reports the start.
@@ -61,10 +61,10 @@ public:
   /// From now on, the messages belong to this leg of a negotiation. The number of the first leg is 1.
   void SetLeg(int leg) noexcept { m_leg = leg; }
 
-  /// Sends `request` and reports both directions. The transport may write the request's `facts`.
+  /// Sends `request`, and reports it and the response. With an observer, `request.facts` is set.
   Tarvel::Ref<Tarvel::Reader> Send(TransportSession &session, Request &request);
 
-  /// Calls `read` with a handler that does the same as `handler`, and reports faults.
+  /// Calls `read` with a handler that does the same as `handler` and also reports faults.
   template <typename Read>
   void Receive(const ResponseHandler &handler, const Read &read);
 
@@ -81,7 +81,7 @@ private:
   void ReportSuccess() noexcept;
   void ReportFailure(const std::type_info *exceptionClass, const char *message) noexcept;
 
-  OperationObserver *m_observer; // null from the start for none, and if there was no memory to report the start
+  OperationObserver *m_observer; // null if there is none, or if there was no memory to report the start
   const std::string &m_id;
   OperationInfo m_operation;
   Clock::time_point m_start;

@@ -16,7 +16,7 @@
 
 namespace SsoClient {
 
-/// Verifies with the options of the service, and hands each refused token to the sink. Immutable, so any number of
+/// Verifies with the options of the service, and passes each refused token to the sink. Immutable, so any number of
 /// threads may use it.
 class ReturnedTokens {
 public:

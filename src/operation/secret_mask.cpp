@@ -20,8 +20,8 @@ constexpr std::string_view MASK = "***";
 constexpr std::string_view WHITE_SPACE = " \t\r\n";
 constexpr std::string_view END_OF_NAME = " \t\r\n/<>&";
 
-/// At the end of a text, at least so many bytes of the beginning of a secret are masked: a service may cut what it
-/// repeats.
+/// A service may cut what it repeats. So the beginning of a secret is masked at the end of a text, too, if it has at
+/// least this number of bytes.
 constexpr std::size_t MIN_BEGINNING = 8;
 
 /// The length of overlapping secrets after which the rest of the text is masked, too.
@@ -180,7 +180,7 @@ void SecretMask::AddToken(const SamlToken &token) noexcept {
 
 void SecretMask::AddToken(const std::string &tokenXml) noexcept {
   Guard([&] {
-    AddSecret(SecretText(tokenXml)); // escaped, it is masked because of its markup
+    AddSecret(SecretText(tokenXml)); // an escaped token is masked because of its markup
     AddValues(tokenXml);
   });
 }

@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// `SecretMask`, which replaces the secrets of an operation in the texts that observers get.
+/// `SecretMask`, which replaces the secrets of an operation in the texts that observers receive.
 
 #pragma once
 
@@ -16,7 +16,7 @@
 namespace SsoClient {
 
 /// Copies of the secrets of one operation, in the forms in which a service may repeat them. The copies are wiped when
-/// the mask is destroyed. Used by one thread at a time.
+/// the mask is destroyed. Only one thread at a time may use a mask.
 class SecretMask {
 public:
   /// Masks the password as it is, without the blanks around it, escaped for XML once or twice, and in Base64. An empty
@@ -33,8 +33,8 @@ public:
   /// Masks the values of signatures and negotiations in a request.
   void AddRequest(const std::string &envelope) noexcept;
 
-  /// Masks the prefix of `qualifiedName` if the colon after it is masked in `masked`: exceptions quote a prefix without
-  /// its colon.
+  /// Masks the prefix of `qualifiedName` also without its colon, because exceptions quote it in that form. Does nothing
+  /// if `masked`, which is `qualifiedName` after `Apply`, still shows the prefix with its colon.
   void AddPrefixOf(std::string_view qualifiedName, std::string_view masked) noexcept;
 
   /// `text` with "***" in place of secrets, printable (`Tarvel::StringUtil::Printable`), and cut at

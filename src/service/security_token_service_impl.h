@@ -59,7 +59,7 @@ public:
   /// @throws what `CreateSamlToken` throws, except that a ParseException becomes an SsoException with the same message.
   std::shared_ptr<const SamlToken> ToSamlToken(const std::string &xml) const;
 
-  /// The same, as a part of the operation that has these events.
+  /// The same, as a part of the operation to which `events` belong.
   std::shared_ptr<const SamlToken> ToSamlToken(const std::string &xml, OperationEvents &events) const;
 
   /// Sends the first leg of a negotiation and sets `spnego` to the service's response.

@@ -13,7 +13,7 @@
 
 namespace SsoClient {
 
-/// Runs all checks after WELL_FORMED on `root`, or on the first assertion in it, and sets what the report says about it.
+/// Runs all checks after WELL_FORMED on `root`, or on the first assertion in it, and writes the results to `report`.
 void ExplainAssertion(const Tarvel::Xml::ElementNode &root, const Tarvel::Xml::Security::KeyInfoResolver &resolver,
                       const VerifyOptions &options, TokenReport &report, ReportRecorder &recorder);
 

@@ -6,9 +6,8 @@
 /// checks and the token read them. They exist only while a token is made. Pointers to elements and views are valid as long
 /// as the tree.
 ///
-/// A field that could not be read, which happens only if the parser goes on after a deviation, has its default value: an
-/// empty text, the `DateTime` of its default constructor, or null. A record whose element was not found has a null
-/// `element`.
+/// If the parser continues after a deviation, a field that it cannot read keeps its initial value, such as an empty
+/// text or null. If an element was not found, `element` in its record is null.
 
 #pragma once
 
@@ -52,7 +51,7 @@ struct SubjectConfirmationType {
   SubjectConfirmationDataType SubjectConfirmationData;
   const Tarvel::Xml::ElementNode *element = nullptr;
   boost::optional<std::string_view> writtenMethod; ///< the attribute's value; empty if there is no such attribute
-  bool isMethodKnown = false;                      ///< whether `Method` is what the attribute says
+  bool isMethodKnown = false;                      ///< whether `Method` was read from the attribute
 };
 
 struct SubjectType {

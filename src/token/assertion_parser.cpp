@@ -28,7 +28,7 @@ const Node *NextBelow(const Node *node, const Node *top) {
   return node == top ? nullptr : node->GetNextSibling();
 }
 
-/// The first SAML 2.0 assertion in the tree of `top` or, if there is none, the first element of that name.
+/// The first SAML 2.0 assertion in the tree of `top` or, if there is none, the first "Assertion" in any namespace.
 const ElementNode *FindAssertion(const Node *top) {
   const ElementNode *inOtherNamespace = nullptr;
   for (const Node *node = top; node; node = NextBelow(node, top)) {

@@ -14,19 +14,19 @@ namespace SsoClient {
 /// accepted: its elements in their order with their attributes, and no others.
 ///
 /// All parsing functions have the same steps: take the element of the expected name, after which the cursor is at the next
-/// sibling; check its attributes, its children in order, and that nothing follows them. Whatever has another form is reported
-/// to `sink`. The sink of a verification throws a `ParseException` at the first deviation, which ends the parse and leaves
+/// sibling; check its attributes, its children in order, and that nothing follows them. Each deviation is reported to
+/// `sink`. The sink of a verification throws a `ParseException` at the first deviation, which ends the parse and leaves
 /// the record partly filled.
 ///
-/// If the sink goes on, the parse does, too, and reads what it can recognise. Each deviation is reported once, in the order
-/// of the parse, and the whole takes linear time:
-/// - An expected element that is not at the cursor is looked for among its siblings (`TakeElement`). If there is none, its
-///   record stays as it is.
+/// If the sink does not throw, the parse continues, and reads what it can recognise. It reports each deviation once, in
+/// the order of the parse, and takes linear time:
+/// - If an expected element is not at the cursor, it is searched for among the siblings (`TakeElement`). If it is not
+///   found, its record stays as it is.
 /// - Unexpected attributes, elements and texts are reported and skipped. Only audiences of further restrictions, and
 ///   attributes of further statements, are added to those of the first one.
-/// - If the element at the cursor is not an assertion, the first `saml:Assertion` below it is read or, if there is none, the
-///   first element of that name in any namespace, which may be the one at the cursor. `assertion.element` is the element
-///   that was read; it is null, and the record is empty, if there is none.
+/// - If the element at the cursor is not an assertion, the first `saml:Assertion` below it is read. If there is none,
+///   the first "Assertion" in any namespace is read, which may be the element at the cursor. `assertion.element` is the
+///   element that was read. If there is none, it is null, and the record is empty.
 void ParseSamlAssertionElement(NodeFilterIterator &iterator, SamlAssertionType &assertion,
                                DeviationSink &sink = ThrowingSink());
 

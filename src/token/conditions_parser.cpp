@@ -46,8 +46,8 @@ void ParseAudience(NodeFilterIterator &iterator, std::set<std::string> &audience
   }
 }
 
-/// Whether the condition at the cursor has a type whose prefix is not bound. That is reported here, once, before the type
-/// is compared with each of those that are not in `conditions` yet.
+/// Whether the condition at the cursor has a type with a prefix that is not bound. Such a prefix is reported here,
+/// once: each comparison with a type that is not in `conditions` yet would report it again.
 bool HasUnboundType(const NodeFilterIterator &iterator, const ConditionsType &conditions, DeviationSink &sink) {
   const ElementNode *const element = IteratorToElement(iterator);
   if (!ElementQNameIs(element, "Condition", Namespaces::SAML) ||

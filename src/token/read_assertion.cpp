@@ -12,7 +12,7 @@ namespace {
 
 using Tarvel::System::DateTime;
 
-/// Dates that the parser sets have this value before. Only a text that is made for it contains this microsecond.
+/// The value of each date before the parser sets it. A text contains exactly this microsecond only on purpose.
 DateTime Unread() {
   return Tarvel::System::DateTimeFromUtc(-1, false);
 }

@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// `ReadAssertion`, an assertion of which a report knows what could be read.
+/// `ReadAssertion`, an assertion with the knowledge which of its parts could be read.
 
 #pragma once
 
@@ -10,8 +10,7 @@
 
 namespace SsoClient {
 
-/// What the parser could read of an assertion, whether it has the accepted form or not. In an assertion of the accepted form,
-/// everything could be read.
+/// What the parser could read of an assertion. If the assertion has the accepted form, that is everything.
 struct ReadAssertion {
   ReadAssertion();
 
@@ -33,7 +32,7 @@ struct ReadAssertion {
   bool isFormAccepted = false;
 };
 
-/// Sets the claims that are read before the names. `read` has an assertion.
+/// Sets the claims that need no `TokenFacts`. `read` must have an assertion.
 void SetClaims(const ReadAssertion &read, UnverifiedClaims &claims);
 
 } // namespace SsoClient

@@ -66,7 +66,7 @@ void ReportRecorder::ReplaceFirstRemedy(std::string_view remedy) {
   m_current->findings.front().remedy = ReportText(remedy);
 }
 
-// One finding is reserved for each check that follows, so that each check that fails lists at least one.
+// One finding is reserved for each later check, so that each check that fails lists at least one.
 bool ReportRecorder::IsFull() const noexcept {
   const std::size_t following = CHECKS - 1 - static_cast<std::size_t>(m_current->check);
   const bool areMessagesTooLong = m_messageBytes > MAX_MESSAGE_BYTES && !m_current->findings.empty();

@@ -16,26 +16,27 @@
 
 namespace SsoClient {
 
-/// `text` in the form of a report: printable and cut.
+/// `text` as reports contain it: printable and shortened.
 std::string ReportText(std::string_view text);
 
 /// Records the checks of a verification one after the other. The report must outlive the recorder, and the tree must not be
 /// changed.
 class ReportRecorder final : public DeviationSink {
 public:
-  /// Gives `report` all checks; none is done yet.
+  /// Adds all checks to `report`, as not done yet.
   explicit ReportRecorder(TokenReport &report);
 
   /// Begins `check`. It has passed unless a deviation is added to it.
   void Begin(TokenReport::Check check);
 
-  /// The summary of the current check.
+  /// Sets the summary of the current check.
   void Summarize(std::string_view summary);
 
-  /// The current check was not done, or not completely: if it has no finding, it did not pass. `missing` says what is missing.
+  /// The current check could not be done completely. Unless it has a finding, its outcome is NOT_DONE. `missing` is the
+  /// summary, which states what is missing.
   void SetNotDone(std::string_view missing);
 
-  /// `check` is not done. `missing` says what is missing.
+  /// The same for `check`, which becomes the current check.
   void Skip(TokenReport::Check check, std::string_view missing);
 
   /// The same for `first` and all checks after it.

@@ -30,7 +30,7 @@ std::string ForIdentifiers(const Finding &finding) {
                                         : "Ask the service's operator to issue tokens whose ID begins with \"_\".";
 }
 
-/// A clock that is wrong by as much as the tolerance is not noticed, so it is wrong by more than `missedBySec`.
+/// The clock is wrong by at least `missedBySec`, because a difference within the tolerance is not noticed.
 std::string ForValidity(const Finding &finding) {
   if (finding.missedBySec == 0) {
     return "Ask the service's operator to issue tokens whose NotBefore is before their NotOnOrAfter.";
@@ -49,7 +49,8 @@ const NamedCertificate *FindStranger(const TokenReport &report) {
   return stranger == report.namedCertificates.end() ? nullptr : &*stranger;
 }
 
-/// Asks for the issuer's certificate. The one that the signature names is only a hint: anyone can put one there.
+/// Asks for the issuer's certificate. The certificate in the signature is only a hint, because anyone can put one
+/// there.
 std::string ForMissingKey(const TokenReport &report) {
   const NamedCertificate *const stranger = FindStranger(report);
   std::string remedy = "Give the certificate of the service that issued the token";

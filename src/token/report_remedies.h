@@ -10,8 +10,9 @@
 
 namespace SsoClient {
 
-/// What the reader can do about `finding`, which belongs to `check`. `report` contains the keys and the named certificates
-/// when `check` is one of the signature's. The text contains names from the report, which are printable.
+/// What the reader can do about `finding`, which belongs to `check`. If `check` is one of the signature's checks,
+/// `report` must already contain the keys and the named certificates. The text contains names from the report, which
+/// are printable.
 std::string RemedyFor(const TokenReport &report, TokenReport::Check check, const TokenReport::Finding &finding);
 
 /// What to do about a document whose document element is not a SAML 2.0 assertion.

@@ -70,7 +70,7 @@ std::string CountOf(std::size_t count, std::size_t all, const char *what) {
   return std::to_string(count) + " of " + std::to_string(all) + " " + what;
 }
 
-/// What the `KeyInfo` says; empty if it names trusted certificates only, or none.
+/// The certificates in the `KeyInfo` that are not trusted, as text; empty if there are none.
 std::string DescribeStrangers(const TokenReport &report) {
   std::string text;
   for (const TokenReport::NamedCertificate &named : report.namedCertificates) {
@@ -84,7 +84,7 @@ std::string DescribeStrangers(const TokenReport &report) {
   return text;
 }
 
-/// Runs one check after the other over what the platform found.
+/// Writes one check after the other into the report, from what the platform found.
 class Explainer {
 public:
   Explainer(const SignatureReport &signature, const TokenReport &report, ReportRecorder &recorder)

@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// `SignatureRefusalText`, the text with which a token is refused because of its signature.
+/// `SignatureRefusalText`, the message for a token that is refused because of its signature.
 
 #pragma once
 

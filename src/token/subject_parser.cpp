@@ -47,7 +47,7 @@ void ParseMethod(const ElementNode &element, SubjectConfirmationType &confirmati
   }
 }
 
-/// The method whose form the data of `element` must have: if the method is not known, the one that the data looks like.
+/// The method for which the data of `element` is read. If the written method is not known, it is guessed from the data.
 SamlToken::ConfirmationType MethodOfData(const ElementNode &element, const SubjectConfirmationType &confirmation) {
   if (confirmation.isMethodKnown) {
     return confirmation.Method;

@@ -1,9 +1,9 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// The rules for a token that a schema cannot express: `CheckTokenProperties`, and what `VerifyOptions` demand.
+/// The rules for a token that a schema cannot express: `CheckTokenProperties`, and what `VerifyOptions` require.
 ///
-/// Each rule reports to a sink. The sink of a verification throws at the first deviation. A function that takes a sink goes on
-/// after a deviation if the sink does.
+/// Each rule reports to a sink. The sink of a verification throws at the first deviation. If the sink does not throw,
+/// the rule continues.
 
 #pragma once
 
@@ -29,13 +29,13 @@ void CheckTokenProperties(const SamlAssertionType &assertion, std::int64_t clock
 /// The rules of `CheckTokenProperties`, in their order.
 void CheckVersion(const SamlAssertionType &assertion, DeviationSink &sink);
 void CheckId(const SamlAssertionType &assertion, DeviationSink &sink);
-/// Returns the time with which the validity was compared.
+/// Returns this machine's time, with which the validity was compared.
 Tarvel::System::DateTime CheckValidity(const ConditionsType &conditions, std::int64_t clockToleranceSec,
                                        DeviationSink &sink);
 void CheckSubjectValidity(const SamlAssertionType &assertion, DeviationSink &sink);
 void CheckDelegation(const SamlAssertionType &assertion, DeviationSink &sink);
 
-/// Checks that a token with the audiences `audience`, none if it is not restricted, is for an accepted one.
+/// Checks that `options` accept one of the token's audiences. `audience` is empty if the token is not restricted.
 /// @param conditions the place that is reported; may be null
 void CheckAudience(const std::set<std::string> &audience, const VerifyOptions &options,
                    const Tarvel::Xml::ElementNode *conditions, DeviationSink &sink);

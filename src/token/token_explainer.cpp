@@ -39,7 +39,7 @@ Ref<Document> ExplainText(const std::string &xml, ReportRecorder &recorder) {
   return document;
 }
 
-/// The text of the token would be the element's canonical form, which is therefore made before anything is checked.
+/// The token's text would be the element's canonical form, so `Verify` makes this form before it checks anything.
 void ExplainCanonicalForm(const ElementNode &element, ReportRecorder &recorder) {
   recorder.Begin(Check::WELL_FORMED);
   try {
@@ -51,7 +51,7 @@ void ExplainCanonicalForm(const ElementNode &element, ReportRecorder &recorder) 
   }
 }
 
-/// What holds for every report; `explain` runs the checks.
+/// Sets what is the same for every report; `explain` runs the checks.
 template <typename ExplainChecks>
 TokenReport MakeReport(const KeyInfoResolver &resolver, const ExplainChecks &explain) {
   TokenReport report;

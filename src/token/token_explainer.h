@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// `ExplainToken`, which runs the checks of a verification to their end and reports them.
+/// `ExplainToken`, which runs all checks of a verification, also after a failure, and reports them.
 
 #pragma once
 

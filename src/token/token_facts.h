@@ -45,8 +45,8 @@ struct TokenFacts {
 /// @throws ParseException when a name, a group or the solution attribute is malformed.
 TokenFacts TakeTokenFacts(SamlAssertionType &&assertion);
 
-/// The steps of `TakeTokenFacts`, in their order. What cannot be read is reported to `sink`, and left out if the sink does not
-/// throw. The parts of `assertion` that they read are moved from.
+/// The steps of `TakeTokenFacts`, in their order. What cannot be read is reported to `sink`, and left out if the sink
+/// does not throw. They move texts out of `assertion`.
 void TakeSubject(SamlAssertionType &assertion, TokenFacts &facts, DeviationSink &sink);
 void TakeAttributes(SamlAssertionType &assertion, TokenFacts &facts, DeviationSink &sink);
 void TakeConditions(ConditionsType &conditions, TokenFacts &facts, DeviationSink &sink);
@@ -76,9 +76,9 @@ std::string ParsePrincipalNameAttribute(const AttributeType &attribute);
 /// @throws ParseException in the same cases as `ParseSamlNameId`.
 Delegate ParseToDelegate(const DelegateType &delegate);
 
-/// The same functions for a sink that may not throw. They return whether the value could be read. If not, they report why and
-/// do not change the name or the flag.
-/// @param place where the group is; may be null
+/// The same functions for a sink that need not throw. They return whether the value could be read. If not, they report
+/// why and do not change the name or the flag.
+/// @param place the element that contains the group; may be null
 bool ParseGroupIdentity(std::string &&value, PrincipalId &group, const Tarvel::Xml::ElementNode *place,
                         DeviationSink &sink);
 bool ParseSamlNameId(const NameIDType &nameId, PrincipalId &principal, DeviationSink &sink);

@@ -15,15 +15,15 @@
 
 namespace SsoClient {
 
-/// The text with which a signature of anything else than the token is refused.
+/// The message for a signature that does not cover the token.
 constexpr std::string_view TOKEN_NOT_COVERED = "Token's signature must cover the entire token";
 
 /// Reads the signature at the cursor, a child of `assertion`, and moves the cursor to the next node. The signature is not
 /// verified yet, but one of its references must be to `assertion` or to the whole document.
 ///
-/// It is reported if there is no element, if it is not a signature, and if there is no such reference. If the sink goes on
-/// and another node is at the cursor, the first `ds:Signature` after it is read; if there is none, the cursor does not move.
-/// `signature` stays null if none can be read.
+/// `sink` receives a missing element, an element that is not a signature, and a signature without such a reference. If
+/// the sink does not throw and another node is at the cursor, the first `ds:Signature` after it is read. If there is
+/// none, the cursor does not move. `signature` stays null if no signature can be read.
 void ParseTokenSignature(NodeFilterIterator &iterator, const Tarvel::Xml::ElementNode &assertion,
                          Tarvel::Ref<Tarvel::Xml::Security::Signature> &signature,
                          DeviationSink &sink = ThrowingSink());

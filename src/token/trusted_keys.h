@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// The texts by which a report names certificates.
+/// The texts that describe certificates in a report.
 
 #pragma once
 
@@ -13,10 +13,10 @@
 
 namespace SsoClient {
 
-/// The certificate's subject; empty if it cannot be written. It is not printable: the subject is the maker's text.
+/// The certificate's subject; empty if it cannot be read. It need not be printable, because its maker has chosen it.
 std::string SubjectOf(const Tarvel::Crypto::Certificate &certificate);
 
-/// One trusted key, of which nothing is known yet but its certificate.
+/// One trusted key, of which only the certificate is known so far.
 TokenReport::TrustedKey DescribeTrustedKey(const Tarvel::Ref<const Tarvel::Crypto::Certificate> &certificate);
 
 /// All keys that `resolver` trusts.

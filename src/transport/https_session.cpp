@@ -37,7 +37,7 @@ HttpsSession::HttpsSession(const Ref<Tarvel::Http::ConnectionSpec> &spec, const 
 
 void HttpsSession::SendRequest(const Request &request, Ref<Reader> &response) {
   Ref<PendingRequestItem> pending;
-  // The facts are read on this thread: after a time-out, the I/O thread must not write them any more.
+  // The facts are read on this thread, because the I/O thread must not write them after a time-out.
   Start(request, noop, nullptr, pending);
   std::shared_ptr<const Exception> error;
   Ref<Reader> body;

@@ -30,14 +30,14 @@ public:
   using Completion = std::function<void(const Tarvel::Exception *failure, Tarvel::Reader *response)>;
 
   /// Posts the request and waits for the whole response. `response` can still be read after the session is destroyed.
-  /// If the request has a place for the facts of the response, they are there also when an HTTP status is thrown as an
-  /// exception.
+  /// If `request.facts` is not null, the facts of the response are written there, also when an HTTP status is thrown as
+  /// an exception.
   /// @throws CommunicationException when the transport fails.
   virtual void SendRequest(const Request &request, Tarvel::Ref<Tarvel::Reader> &response) = 0;
 
   /// Posts the request without waiting; `item` cancels it. `completion` runs on an I/O thread, where it must neither
-  /// block nor wait for another request. The facts of the response are written there before. The product itself calls
-  /// only `SendRequest`.
+  /// block nor wait for another request. The facts of the response are written on the same thread, before `completion`.
+  /// The product itself calls only `SendRequest`.
   virtual void SendRequestAsync(const Request &request, const Completion &completion,
                                 Tarvel::Ref<Tarvel::System::ScheduledItem> &item) = 0;
 

@@ -1,9 +1,9 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// `DeviationSink`, which receives everything for which the rules of the accepted form refuse an assertion.
+/// `DeviationSink`, which receives each deviation of an assertion from the accepted form.
 ///
-/// Verification and reports run the same rules with different sinks: the sink of a verification throws at the first
-/// deviation; that of a report keeps the deviation, and the rule goes on.
+/// Verification and reports run the same rules with different sinks. The sink of a verification throws at the first
+/// deviation. The sink of a report keeps the deviation, and the rule continues.
 
 #pragma once
 
@@ -18,13 +18,13 @@ namespace SsoClient {
 struct Deviation {
   std::string message;                               ///< the text of the `ParseException`
   const Tarvel::Xml::ElementNode *element = nullptr; ///< where it is; null if there is no element
-  std::string attribute;                             ///< the name of an attribute; empty if it is about the element
+  std::string attribute;                             ///< the attribute's name; empty if the element itself deviates
   std::string allowed;                               ///< what the form allows or expects there; may be empty
   std::string found;                                 ///< what is there; may be empty
-  std::int64_t missedBySec = 0; ///< of a time: by how many seconds this machine's clock misses it, after the tolerance
+  std::int64_t missedBySec = 0; ///< by how many seconds this machine's clock is beyond a limit and the tolerance
 };
 
-/// Receives deviations in the order in which the rules meet them. For one thread.
+/// Receives deviations in the order in which the rules find them. Used by one thread, except for `ThrowingSink`.
 class DeviationSink {
 public:
   /// Whether deviations are only counted from now on, so that their texts need not be made.
@@ -47,8 +47,8 @@ protected:
 /// The sink of verifications, which throws at the first deviation. It has no state, so all threads may use it.
 DeviationSink &ThrowingSink() noexcept;
 
-/// Reports the deviation that `make` returns. `make` is called only if `sink` keeps the deviation, so that a document with a
-/// million deviations costs no texts.
+/// Reports the deviation that `make` returns. `make` is called only if `sink` keeps the deviation, so a document with a
+/// million deviations does not cost a million texts.
 template <typename Make>
 void ReportDeviation(DeviationSink &sink, const Make &make) {
   if (sink.IsFull()) {

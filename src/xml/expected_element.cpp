@@ -21,7 +21,8 @@ NodeFilterIterator PastTheEnd(NodeFilterIterator iterator) {
   return iterator;
 }
 
-/// A cursor on the first element of that name from the cursor on. If there is none, on the first that has the local name.
+/// A cursor on the first element of that name, from `iterator` on. If there is none, the cursor is on the first element
+/// of that local name, or past the end.
 NodeFilterIterator FindElement(NodeFilterIterator iterator, std::string_view localName, std::string_view namespaceUri) {
   NodeFilterIterator inOtherNamespace = PastTheEnd(iterator);
   for (; iterator.node; iterator.MoveToSibling()) {

@@ -2,8 +2,8 @@
 /// @file
 /// What the accepted form allows at a place, and what is there, as arguments of `Refuse`: they become texts on demand.
 ///
-/// Names in namespaces that the form uses are written with the usual prefixes, for any prefix in the document:
-/// "saml:Conditions".
+/// Names in namespaces that the form uses are written with the usual prefix, such as "saml:Conditions", even if the
+/// document has another prefix. `WhatIsAt` writes names as they are in the document.
 
 #pragma once
 

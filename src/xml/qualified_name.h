@@ -30,7 +30,7 @@ struct QNameView {
   std::string ToString() const;
 };
 
-/// For `Tarvel::MessageFormatter`.
+/// The text of `name` for `Tarvel::MessageFormatter`.
 std::string FormatMessageArgument(const QNameView &name);
 
 /// `name` in no namespace: the name of an attribute without a prefix.

@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// `Refuse`, by which every rule of the accepted form reports a deviation.
+/// `Refuse`, with which every rule of the accepted form reports a deviation.
 
 #pragma once
 
@@ -26,16 +26,16 @@ struct Place {
   Place(const Tarvel::Xml::ElementNode *where, std::string_view attributeName = {}) noexcept
       : element(where), attribute(attributeName) {}
 
-  /// The element at the cursor or, if there is no element, the one whose children the cursor moves over.
+  /// The element at the cursor or, if there is no element, the parent of the nodes over which the cursor moves.
   Place(const NodeFilterIterator &iterator) noexcept
       : element(IteratorToElement(iterator) ? IteratorToElement(iterator) : Tarvel::Xml::AsElement(iterator.parent)) {}
 
   const Tarvel::Xml::ElementNode *element; ///< null if there is no element at all
-  std::string_view attribute;              ///< its name as written; empty if it is about the element
+  std::string_view attribute;              ///< the attribute's name as written; empty if the place is the element
 };
 
-/// Reports a deviation to `sink`: the message is `format` with `args` in its placeholders, `allowed` is what the form allows
-/// at `place`, and `found`, which is shortened, is what is there. Returns only if the sink of a report goes on.
+/// Reports a deviation to `sink`: the message is `format` with `args` in its placeholders, `allowed` is what the form
+/// allows at `place`, and `found`, which is shortened, is what is there. Returns only if the sink does not throw.
 ///
 /// `allowed`, `found` and `args` may be of any type that `Tarvel::MessageFormatter` accepts. They become texts only if the
 /// sink is not full, so a rule should pass its values, not texts that it has made of them.

@@ -34,7 +34,7 @@ std::string_view NameOf(const ElementNode *element) {
   return element ? element->GetName() : std::string_view();
 }
 
-/// The element's name for each prefix; without a namespace if its prefix is not bound.
+/// The element's qualified name, which does not depend on the prefix; without a namespace if the prefix is not bound.
 QNameView QNameOf(const ElementNode &element) {
   std::string_view namespaceUri;
   element.LookupNamespace(element.GetPrefix(), namespaceUri);

@@ -2,10 +2,10 @@
 /// @file
 /// The checks by which the assertion parser refuses everything that it does not know.
 ///
-/// A check that fails reports to a sink, which throws a `ParseException` if it is that of a verification, and does not change
-/// its arguments. If the sink goes on, a check reports everything that it refuses, in document order. The message names the
-/// element, unless the caller passes the message. Checks of content use the cursor, so they ignore comments and white space
-/// between nodes.
+/// A check that fails reports to a sink, and does not change its arguments. The sink of a verification throws a
+/// `ParseException`. If the sink does not throw, a check reports everything that it refuses. The message contains the
+/// element's name, unless the caller passes the message. Checks of content use the cursor, so they ignore comments and
+/// white space between nodes.
 
 #pragma once
 

@@ -30,8 +30,8 @@ KeyKind GetKeyKind(const Certificate &certificate, unsigned &bits);
 /// Whether an RSA key's public exponent is odd and at least 3; true for other kinds of keys.
 bool HasAcceptableExponent(const Certificate &certificate);
 
-/// Why no signature by the certificate's key is accepted, whatever its scheme; empty when signatures may be. An accepted
-/// key is RSA with at least `MIN_RSA_BITS` and an acceptable exponent, or EC on P-256, P-384 or P-521.
+/// Why no signature by the certificate's key is accepted, with any scheme; empty if there is no such reason. An
+/// accepted key is RSA with at least `MIN_RSA_BITS` and an acceptable exponent, or EC on P-256, P-384 or P-521.
 std::string RefuseKey(const Certificate &certificate);
 
 /// Whether `signature` is the signature by the certificate's key over a message with that digest. An ECDSA value is r

@@ -84,7 +84,7 @@ void HandshakeRecord::NoteProtocol(const SSL *connection) {
   const SSL_CIPHER *const agreed = SSL_get_current_cipher(connection);
   const SSL_CIPHER *const cipher = agreed ? agreed : SSL_get_pending_cipher(connection);
   if (cipher) {
-    m_probe.version = SSL_get_version(connection); // before a cipher suite is chosen, it is only a guess
+    m_probe.version = SSL_get_version(connection); // only a guess until a cipher suite is chosen
     m_probe.cipher = SSL_CIPHER_get_name(cipher);
   }
 }
@@ -101,7 +101,7 @@ void HandshakeRecord::NoteChain(X509_STORE_CTX *verification) {
 void HandshakeRecord::NoteAnchor(X509_STORE_CTX *verification) {
   const STACK_OF(X509) *const chain = X509_STORE_CTX_get0_chain(verification);
   const int length = sk_X509_num(chain);
-  // The certificates before this number are the server's, and the others are from the trust store.
+  // This number of certificates at the beginning are the server's, and the others are from the trust store.
   if (length > 0 && X509_STORE_CTX_get_num_untrusted(verification) < length) {
     m_probe.anchor = Copy(sk_X509_value(chain, length - 1));
   }
@@ -112,7 +112,7 @@ void HandshakeRecord::NoteRefusal(X509_STORE_CTX *verification, std::string text
   if (!HasRefusals()) {
     m_firstCode = code;
   } else if (code == X509_V_ERR_UNABLE_TO_VERIFY_LEAF_SIGNATURE) {
-    return; // says again that the issuer is not known
+    return; // repeats that the issuer is not known
   }
   ServerRefusal refusal;
   refusal.kind = KindOf(code);

@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// `HandshakeRecord`, what a handshake shows to a probe.
+/// `HandshakeRecord`, what a probe records of a handshake.
 
 #pragma once
 
@@ -13,7 +13,7 @@
 
 namespace Tarvel::Ssl {
 
-/// Filled in by the connection during its handshake, under the lock of its stream. Read it after the handshake's end.
+/// The connection fills it in during its handshake, under the lock of its stream. Read it after the handshake's end.
 class HandshakeRecord {
 public:
   /// Notes the first octets that the server sends.
@@ -29,7 +29,7 @@ public:
   /// @throws OutOfMemoryException, InvalidStateException
   void NoteAnchor(X509_STORE_CTX *verification);
 
-  /// Notes the reason for which OpenSSL has just refused a certificate. @param text describes it.
+  /// Notes why OpenSSL has just refused a certificate. @param text describes the reason.
   void NoteRefusal(X509_STORE_CTX *verification, std::string text);
 
   void NoteOtherThumbprint(std::string text);
@@ -39,7 +39,7 @@ public:
 
   /// Whether a certificate was refused.
   bool HasRefusals() const noexcept { return !m_probe.refusals.empty(); }
-  /// OpenSSL's code of the first reason, and its text. There must be one.
+  /// OpenSSL's code for the first refusal, and the refusal's text. `HasRefusals` must be true.
   int GetFirstCode() const noexcept { return m_firstCode; }
   const std::string &GetFirstText() const noexcept { return m_probe.refusals.front().text; }
 

@@ -30,7 +30,8 @@ std::int64_t MicrosecondsSince(Clock::time_point start) {
   return std::chrono::duration_cast<std::chrono::microseconds>(Clock::now() - start).count();
 }
 
-/// When a step that begins now must have ended. Far in the future for a time-out that the clock cannot represent.
+/// The time when a step that begins now must have ended. A longer time-out than a year counts as a year, because the
+/// clock cannot represent every value.
 Clock::time_point DeadlineOf(std::int64_t timeoutMicroseconds) {
   constexpr std::int64_t YEAR = std::int64_t{366} * 24 * 60 * 60 * 1'000'000;
   return Clock::now() + std::chrono::microseconds(std::clamp<std::int64_t>(timeoutMicroseconds, 0, YEAR));
@@ -44,7 +45,7 @@ std::string SystemText(int error) {
   return boost::system::system_category().message(error);
 }
 
-/// How an operation ended: the failure's message, empty for success; and when.
+/// How an operation ended: the failure's message, which is empty for success, and the duration.
 struct End {
   std::string failure;
   std::int64_t durationMicroseconds = 0;
@@ -62,7 +63,7 @@ public:
 
   bool WaitUntil(Clock::time_point deadline) const { return m_end.wait_until(deadline) == std::future_status::ready; }
 
-  /// Waits for the call. To be called once.
+  /// Waits for the call. Use it only once.
   End Get() { return m_end.get(); }
 
 private:
@@ -134,7 +135,7 @@ public:
   const Ref<System::TcpClientSocket> &GetSocket() const noexcept { return m_socket; }
 
 private:
-  /// Removes what the report says elsewhere.
+  /// Removes the target, which the probe contains elsewhere.
   std::string WithoutTarget(std::string failure) const {
     const std::string begin = "Cannot connect to " + m_target + ": ";
     return failure.compare(0, begin.size(), begin) == 0 ? failure.substr(begin.size()) : std::move(failure);
@@ -156,7 +157,7 @@ private:
   Completion m_completion;
 };
 
-/// Closes the sockets of all attempts at the end, whatever happens.
+/// Closes the sockets of all attempts when it is destroyed, also after an exception.
 class AttemptList {
 public:
   AttemptList() = default;
@@ -172,7 +173,7 @@ public:
     m_attempts.push_back(std::make_unique<Attempt>(address, port));
   }
 
-  /// Waits for all. @return the first in order that has a connection, or null.
+  /// Waits for all attempts. @return the first attempt, in order, that has a connection, or null.
   const Attempt *Finish(Clock::time_point deadline, std::vector<AddressProbe> &probes) {
     const Attempt *connected = nullptr;
     for (const std::unique_ptr<Attempt> &attempt : m_attempts) {

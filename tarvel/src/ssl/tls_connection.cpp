@@ -32,7 +32,7 @@ std::string DescribeSubject(X509 *certificate) {
   return StringUtil::Shorten({data, static_cast<std::size_t>(length)});
 }
 
-/// Why OpenSSL has refused the certificate that it looked at last.
+/// Why OpenSSL has refused the certificate that it checked last.
 std::string DescribeRefusal(X509_STORE_CTX *verification) {
   return std::string("the server's certificate was not accepted: ") +
          X509_verify_cert_error_string(X509_STORE_CTX_get_error(verification)) + " (certificate \"" +
@@ -59,7 +59,7 @@ void TlsConnection::Begin(const std::string &host, const std::string &parameter)
   BIO *toSend = nullptr;
   ConnectionHandle connection = MakeConnection(*m_identity, received, toSend);
   m_sessionKey = m_endpoint + '\n' + m_identity->ToKey();
-  if (!m_record) { // a record is one of a full handshake
+  if (!m_record) { // a resumed session would not show the server's certificates
     if (const SessionHandle session = m_context->GetSessions().Take(m_sessionKey)) {
       SSL_set_session(connection.get(), session.get()); // if OpenSSL cannot use it, the handshake is a full one
     }
@@ -231,7 +231,7 @@ std::string TlsConnection::VerifyChain(X509_STORE_CTX *verification) const {
   }
   if (m_record) {
     m_record->NoteAnchor(verification);
-    if (m_record->HasRefusals()) { // verification has gone on after them
+    if (m_record->HasRefusals()) { // the verification has continued after them
       X509_STORE_CTX_set_error(verification, m_record->GetFirstCode());
       return m_record->GetFirstText();
     }

@@ -31,8 +31,8 @@ public:
   static constexpr std::size_t RECORD_BYTES = 16384;
 
   /// @param endpoint a part of the key under which sessions are remembered.
-  /// @param record notes what the handshake shows, and makes the verification go on after the first reason against a
-  ///        certificate; the server is refused all the same. Null for none.
+  /// @param record notes what the handshake shows; null for none. With a record, the verification continues after the
+  ///        first reason to refuse a certificate; the server is still refused.
   TlsConnection(const Ref<SSLContextImpl> &context, const std::string &endpoint,
                 const std::shared_ptr<HandshakeRecord> &record);
   TlsConnection(const TlsConnection &) = delete;
@@ -112,7 +112,7 @@ private:
   std::string VerifyServer(X509_STORE_CTX *verification) const;
   std::string VerifyThumbprint(X509_STORE_CTX *verification) const;
   std::string VerifyChain(X509_STORE_CTX *verification) const;
-  /// Called by OpenSSL for each certificate and each reason against one, when there is a record.
+  /// If there is a record, OpenSSL calls it for each certificate and each reason to refuse one.
   static int OnVerificationStep(int isAccepted, X509_STORE_CTX *verification) noexcept;
   void KeepSession(SessionHandle session);
 

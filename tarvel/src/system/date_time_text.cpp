@@ -23,7 +23,7 @@ struct Fraction {
   bool isZero; ///< whether every digit is 0, including those finer than a microsecond
 };
 
-/// Reads the text from left to right. Whatever follows the first refusal changes nothing.
+/// Reads the text from left to right, and keeps the first refusal.
 class Scanner {
 public:
   explicit Scanner(std::string_view text) noexcept : m_text(text) {}

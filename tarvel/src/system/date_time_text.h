@@ -23,7 +23,7 @@ struct DateTimeFields {
   std::int32_t biasMinutes; ///< minutes east of UTC, -840 to 840
 };
 
-/// Why a text is not a date-time, in a form that costs nothing until it is read.
+/// Why a text is not a date-time. It contains no text that must be composed, so it is cheap if the reason is not shown.
 struct DateTimeRefusal {
   const char *reason = nullptr; ///< null if the text is not refused
   std::size_t character = 0;    ///< from 1; 0 if the reason is not about a character
@@ -31,7 +31,8 @@ struct DateTimeRefusal {
   explicit operator bool() const noexcept { return reason; }
 };
 
-/// Splits `text` into its fields, unless it has another form, or a field is out of its range.
+/// Splits `text` into its fields. Returns why the text is refused, if it has another form or a field is out of its
+/// range.
 DateTimeRefusal ReadDateTimeText(std::string_view text, DateTimeFields &fields) noexcept;
 
 /// Throws a `DateTimeFormatException` that quotes `text`.

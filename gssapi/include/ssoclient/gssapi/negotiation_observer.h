@@ -13,8 +13,8 @@
 
 namespace SsoClient::Gssapi {
 
-/// The handler has processed a leg of the service, and has made the client's next leg. It contains nothing of a leg or
-/// a ticket.
+/// The handler has processed a leg of the service, and has made the client's next leg. The event contains no part of a
+/// leg or a ticket.
 struct NegotiationLegEvent {
   int leg = 0;                           ///< the number of the client's leg, from 1
   std::size_t serviceOctets = 0;         ///< of the service's leg; 0 if there was none
@@ -22,12 +22,12 @@ struct NegotiationLegEvent {
   std::string mechanism;                 ///< the mechanism, such as "Kerberos 5"; empty as long as none has been chosen
   bool isComplete = false;               ///< whether the client's side of the negotiation is complete
   bool isMutuallyAuthenticated = false;  ///< whether the service has proved its identity
-  std::int64_t durationMicroseconds = 0; ///< the time that the handler needed, with the realm's answers
+  std::int64_t durationMicroseconds = 0; ///< the time that the handler needed, including the waits for the realm
 };
 
-/// Implemented by the caller, and called on the thread that calls `SpnegoHandler::NegotiateLeg`, within that call. What
-/// its functions throw is written to the log (logger "SsoClient") and changes nothing else. An observer that several
-/// handlers share must be safe on all their threads.
+/// The caller implements it. Its functions are called on the thread that calls `SpnegoHandler::NegotiateLeg`, within
+/// that call. What they throw is written to the log (logger "SsoClient") and changes nothing else. An observer that
+/// several handlers share must be safe on all their threads.
 class SSOCLIENT_GSSAPI_API NegotiationObserver {
 public:
   /// A leg has been made.

@@ -37,7 +37,7 @@ public:
   /// up to three fewer so that no UTF-8 character is split, then "... (N more bytes)".
   static std::string Shorten(std::string_view text, std::size_t most = MAX_VALUE_BYTES);
 
-  /// `text`, which is UTF-8, with \\uXXXX in place of each character that could control a terminal or fake a line:
+  /// `text`, which is UTF-8, with \\uXXXX in place of each character that could control a terminal or begin a new line:
   /// control characters, line and paragraph separators, and characters that change the direction of text. An octet that is
   /// not part of a UTF-8 sequence counts as the character of that number.
   static std::string Printable(std::string_view text);

@@ -20,15 +20,15 @@ constexpr std::size_t MAX_CERTIFICATE_NAMES = 100;
 struct CertificateFacts {
   std::string key; ///< kind and size of the public key, such as "RSA, 2048 bits"; "unknown" if OpenSSL does not know it
 
-  /// Why no signature by this key over a token is ever accepted; empty if signatures may be. The same rule decides when a
-  /// signature is verified.
+  /// Why no signature by this key over a token is accepted; empty if there is no such reason. The verification of
+  /// signatures uses the same rule.
   std::string keyRefusal;
 
   /// The host names and addresses that the certificate is for (RFC 5280, subject alternative names of the kinds DNS and
-  /// IP); if none of them is a host name, also the common names of the subject. In the certificate's order, as it has
-  /// them: they are not verified, and may contain any character.
+  /// IP); if none of them is a host name, also the common names of the subject. Order and texts are those of the
+  /// certificate: they are not verified, and may contain any character.
   std::vector<std::string> names;
-  std::size_t nameCount = 0; ///< how many there are, also those beyond the limit
+  std::size_t nameCount = 0; ///< how many names there are, including those beyond the limit
 };
 
 /// The facts about `certificate`. Safe on any thread.

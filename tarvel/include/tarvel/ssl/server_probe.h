@@ -42,13 +42,13 @@ struct ServerRefusal {
   std::string text;        ///< in the words of an `SSLException`, without the endpoint
   std::size_t depth = 0;   ///< of the certificate in the chain that was verified; 0 is the server's
 
-  /// That certificate, which need not be one of those that the server sent. Null for one that cannot be read, and for
-  /// `OTHER_THUMBPRINT`.
+  /// The certificate at that depth, which need not be one of those that the server sent. Null if it cannot be read, and
+  /// for `OTHER_THUMBPRINT`.
   Ref<const Crypto::Certificate> certificate;
 };
 
-/// What a TLS handshake has shown. All texts and certificates are the server's, and nothing of them is verified unless
-/// the server was accepted.
+/// What a TLS handshake has shown. The certificates are as the server sent them, and not verified unless the server was
+/// accepted.
 struct HandshakeProbe {
   /// How the handshake ended.
   enum class Outcome : std::int32_t {
@@ -68,15 +68,15 @@ struct HandshakeProbe {
   std::string version;                   ///< such as "TLSv1.3"; empty if none was agreed on
   std::string cipher;                    ///< the cipher suite's name; empty if none was agreed on
 
-  /// The certificates that the server sent, its own first. Null for one that cannot be read.
+  /// The certificates that the server sent, its own first. Null for a certificate that cannot be read.
   Crypto::CertificateList chain;
-  std::size_t chainLength = 0; ///< how many the server sent, also those that were not kept
+  std::size_t chainLength = 0; ///< how many the server sent, including those that were not kept
 
-  /// The trusted certificate at which the chain ends; null when it ends at none, and when a thumbprint replaced the
-  /// check of the chain.
+  /// The trusted certificate at which the chain ends. Null if there is none, and if a thumbprint replaced the check of
+  /// the chain.
   Ref<const Crypto::Certificate> anchor;
 
-  /// Every reason, in the order in which they were found: the first one is the one in `failure`.
+  /// The reasons to refuse the server, in the order in which they were found. `failure` contains the first.
   std::vector<ServerRefusal> refusals;
 };
 
@@ -108,9 +108,10 @@ struct ServerProbe {
 };
 
 /// Looks up `host`, connects to each of its addresses, and performs a TLS handshake with the first that answers. The
-/// same code as for every other connection decides whether the server is accepted, but here it goes on after the first
-/// reason against a certificate, and notes each. The connection is closed after the handshake, whether or not the server
-/// was accepted; nothing else is sent. No session is resumed. Blocks the calling thread, which must not be an I/O thread.
+/// same code as for every other connection decides whether the server is accepted, but here it continues after the
+/// first reason to refuse a certificate, and records each. The connection is closed after the handshake, whether or not
+/// the server was accepted; nothing else is sent. No session is resumed. The call blocks the thread, which must not be
+/// an I/O thread.
 /// @param host as in `System::TcpClientSocket::AsyncConnect`.
 /// @param port 1 to 65535.
 /// @param context what to trust, made by `CreateSSLContext`; null to perform no handshake.

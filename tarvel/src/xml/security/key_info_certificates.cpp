@@ -15,7 +15,7 @@ namespace Tarvel::Xml::Security {
 namespace {
 
 constexpr std::size_t MAX_KEY_INFO_CERTIFICATES = 16; // further ones are not examined
-constexpr std::size_t MAX_STRANGER_BYTES = 64 * 1024; // larger ones cost too much to decode, and are not real
+constexpr std::size_t MAX_STRANGER_BYTES = 64 * 1024; // larger ones are slow to decode, and not real certificates
 
 /// The text that `describe` returns; empty if it cannot be made.
 template <typename Describe>

@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// The certificates in a `ds:KeyInfo`, as text, and comparing certificates.
+/// Functions that read, describe and compare the certificates in a `ds:KeyInfo`.
 
 #pragma once
 
@@ -20,10 +20,10 @@ std::vector<std::string_view> CertificateTexts(const ElementNode &keyInfo);
 /// The bytes that a certificate's text encodes; empty if it is not Base64.
 std::vector<std::uint8_t> DecodeCertificateText(std::string_view text);
 
-/// What a report says about a certificate.
+/// What a report says about a certificate. `isTrusted` is false.
 SignatureReport::NamedCertificate DescribeCertificate(const Crypto::Certificate &certificate);
 
-/// What a report says about a certificate of a message, which may be anything. More than 64 KiB are not decoded.
+/// What a report says about octets that a message has in place of a certificate. More than 64 KiB are not decoded.
 SignatureReport::NamedCertificate DescribeStranger(const std::vector<std::uint8_t> &der);
 
 /// The certificates in their order, without nulls and duplicates.

@@ -28,14 +28,14 @@ struct IdentifierSearch {
   bool isAmbiguous = false; ///< several elements have the identifier
 };
 
-/// The searches that `uris` need: one for each different identifier, and none for "". `sink` receives each different URI that
-/// is neither "" nor "#x".
+/// The searches that `uris` need: one for each different identifier, and none for "". `sink` receives once each
+/// different URI that is neither "" nor "#x".
 std::vector<IdentifierSearch> PlanSearches(const std::vector<ReferenceUri> &uris, RefusalSink &sink = ThrowingSink());
 
 /// The targets of `uris`, in their order, in the tree that contains `root`: "" is the document (or topmost element), "#x"
 /// the one element with an identifier x in an attribute ID, Id, wsu:Id or xml:id. So the identifier of `root` cannot
-/// refer to another element. The tree is walked once for all references. If the URI is neither "" nor "#x", or no element or
-/// more than one has the identifier, `sink` receives that once for each different URI, and the target is null.
+/// refer to another element. The tree is walked once for all references. If a URI is neither "" nor "#x", or no element
+/// or more than one has the identifier, the target is null, and `sink` receives one refusal for each different URI.
 std::vector<const Node *> ResolveReferences(const ElementNode &root, const std::vector<ReferenceUri> &uris,
                                             RefusalSink &sink = ThrowingSink());
 

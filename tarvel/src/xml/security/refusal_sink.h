@@ -1,9 +1,9 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// `RefusalSink`, which receives everything for which the rules of a verification refuse a signature.
+/// `RefusalSink`, which receives each reason for which the rules of a verification refuse a signature.
 ///
-/// `Signature::Verify` and `Signature::Explain` run the same rules with different sinks: the sink of a verification throws
-/// at the first refusal; that of a report keeps the refusal, and the rule goes on.
+/// `Signature::Verify` and `Signature::Explain` run the same rules with different sinks. The sink of a verification
+/// throws at the first refusal. The sink of a report keeps the refusal, and the rule continues.
 
 #pragma once
 
@@ -13,11 +13,11 @@
 
 namespace Tarvel::Xml::Security {
 
-/// Receives refusals in the order in which the rules meet them. For one thread.
+/// Receives refusals in the order in which the rules find them. Used by one thread, except for `ThrowingSink`.
 class RefusalSink {
 public:
-  /// Receives the rule that refuses, the message and the place (may be null). Rules add what they found and wanted to the
-  /// result, so that a verification does not spend time on these texts. The result is valid until the next call.
+  /// Receives the rule that refuses, the message, and the place, which may be null. Rules write what they found and
+  /// wanted into the result, so a verification spends no time on these texts. The result is valid until the next call.
   /// @throws XmlSecurityException with the message, if this is the sink of a verification.
   virtual SignatureReport::Refusal &Add(SignatureRule rule, const std::string &message, const ElementNode *element) = 0;
 

@@ -37,7 +37,8 @@ Crypto::CertificateList AllTrusted(const KeyInfoResolver &resolver) {
   }
 }
 
-/// Runs the rules of a verification in their order, and goes on after each refusal with what can still be examined.
+/// Runs the rules of a verification in their order. After a refusal, it continues with everything that can still be
+/// checked.
 class Explanation final : private RefusalSink {
 public:
   Explanation(const SignatureInTree &signature, const KeyInfoResolver &resolver)
@@ -194,8 +195,8 @@ void Explanation::CheckValue() {
   }
 }
 
-// A verification tries its candidates until one made the value. All other usable keys are tried here only to report which
-// one made it, so a failure with one of them is not a refusal.
+// A verification tries its candidates until it finds the key that made the value. All other usable keys are tried here
+// only for the report, so a failure with one of them is not a refusal.
 void Explanation::TryKeys(const DigestValue &signedInfo) {
   const std::size_t refusalsBefore = m_report.refusals.size();
   std::vector<const Key *> tried;
@@ -231,7 +232,7 @@ void Explanation::TryUnselected(Key &key, const DigestValue &signedInfo) {
   }
 }
 
-/// If a key that the `KeyInfo` does not select made the value, adds that to the refusals that are about keys.
+/// If a key that the `KeyInfo` does not select made the value, adds this key to the refusals that are about keys.
 void Explanation::NameUnselectedMaker() {
   const auto maker =
       std::find_if(m_report.keys.begin(), m_report.keys.end(), [](const Key &key) { return key.madeSignature; });

@@ -98,7 +98,7 @@ void RefuseParameter(RefusalSink &sink, const AlgorithmSyntax &syntax, std::stri
       .wanted = "no such parameter";
 }
 
-// The following functions return whether `sink` received nothing from them, or the algorithm only then.
+// The following functions return true, or the algorithm, only if they did not refuse anything.
 
 bool RequireNoOtherParameter(const AlgorithmSyntax &syntax, RefusalSink &sink) {
   if (syntax.otherParameter.empty()) {
@@ -197,7 +197,7 @@ void RequireFewTransforms(const std::vector<AlgorithmSyntax> &transforms, Refere
   }
 }
 
-/// Adds a transform that may follow those before it. @return whether it is a canonicalisation, which must be the last.
+/// Adds a transform that is allowed at its position. @return whether it is a canonicalisation, which must be the last.
 bool PlanTransform(const AlgorithmSyntax &transform, ReferencePlan &plan, RefusalSink &sink) {
   if (transform.uri == SignatureUri::ENVELOPED_SIGNATURE) {
     plan.isComputable = RequireNoParameters(transform, sink) && plan.isComputable;

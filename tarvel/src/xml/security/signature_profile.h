@@ -30,7 +30,7 @@ struct ReferencePlan {
   bool omitsSignature = false;   ///< the enveloped-signature transform
   CanonicalizationMethod method; ///< never with comments: same-document references leave them out
   Crypto::DigestAlgorithm digest = Crypto::DigestAlgorithm::SHA256;
-  bool isComputable = true; ///< no algorithm of it is refused
+  bool isComputable = true; ///< whether the digest can be computed: no algorithm or transform is refused
 };
 
 /// How a signature is verified. Algorithms that are refused are missing.
@@ -43,8 +43,8 @@ struct SignaturePlan {
 std::optional<SignatureAlgorithm> FindSignatureAlgorithm(std::string_view uri);
 std::optional<Crypto::DigestAlgorithm> FindDigestAlgorithm(std::string_view uri);
 
-/// How to verify a signature that has this syntax. `sink` receives what is outside the profile; if it throws, the result of a
-/// call that returns is complete.
+/// How to verify a signature that has this syntax. `sink` receives what is outside the profile. If the sink throws at
+/// the first refusal, each plan that is returned is complete.
 SignaturePlan RequireProfile(const SignatureSyntax &syntax, RefusalSink &sink);
 
 } // namespace Tarvel::Xml::Security

@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// The rules of a signature's verification that follow the profile: keys, references, value and digests.
+/// The rules of a signature's verification that are checked after the profile: keys, references, value and digests.
 
 #pragma once
 
@@ -17,9 +17,9 @@
 
 namespace Tarvel::Xml::Security {
 
-/// A signature that was read from a tree, which it keeps alive.
+/// A signature that was read from a tree. It keeps the tree alive.
 struct SignatureInTree {
-  Ref<const ElementNode> root; ///< references resolve in the tree that contains it
+  Ref<const ElementNode> root; ///< an element of the tree in which references resolve
   Ref<const ElementNode> element;
   SignatureSyntax syntax;
 };
@@ -27,16 +27,17 @@ struct SignatureInTree {
 /// Whether the certificate's key can be used with a scheme.
 bool IsUsable(const Crypto::Certificate &certificate, Crypto::SignatureScheme scheme);
 
-/// The usable ones of `candidates`, which may be null. If there are none, `sink` receives that.
+/// The usable keys of `candidates`, which may contain nulls. If no key is usable, `sink` receives a refusal.
 Crypto::CertificateList RequireUsableKeys(const SignatureSyntax &syntax, Crypto::SignatureScheme scheme,
                                           Crypto::CertificateList candidates, RefusalSink &sink);
 
-/// The targets of the planned references, in their order. `sink` receives each URI that does not resolve; the target is null.
+/// The targets of the planned references, in their order. If a URI does not resolve, `sink` receives a refusal, and the
+/// target is null.
 std::vector<const Node *> ResolveTargets(const SignatureInTree &signature, const SignaturePlan &plan,
                                          RefusalSink &sink);
 
-/// Whether a target contains the signature, if the reference has the enveloped-signature transform, and more than that. If it
-/// does not, `sink` receives that.
+/// Whether `target` contains the signature and more, if the reference has the enveloped-signature transform; always
+/// true without that transform. If the result is false, `sink` has received a refusal.
 bool RequireTargetContainsSignature(const SignatureInTree &signature, const ReferenceSyntax &reference,
                                     const ReferencePlan &plan, const Node &target, RefusalSink &sink);
 
@@ -45,12 +46,12 @@ bool RequireTargetContainsSignature(const SignatureInTree &signature, const Refe
 DigestValue DigestSignedInfo(const SignatureInTree &signature, const CanonicalizationMethod &method,
                              SignatureAlgorithm algorithm);
 
-/// Whether a key made the signature's value over that digest.
+/// Whether a key made the signature's value over the digest `signedInfo`.
 /// @throws what `Crypto::VerifyDigest` throws.
 bool IsMadeBy(const Crypto::Certificate &key, const SignatureSyntax &syntax, SignatureAlgorithm algorithm,
               const DigestValue &signedInfo);
 
-/// The digest of a target, which must be one that contains the signature where that is required.
+/// The digest of `target`, for which `RequireTargetContainsSignature` must be true.
 /// @throws what `DigestCanonicalForm` throws.
 DigestValue DigestTarget(const SignatureInTree &signature, const ReferencePlan &plan, const Node &target);
 

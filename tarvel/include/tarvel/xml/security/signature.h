@@ -79,11 +79,13 @@ public:
   /// @throws InvalidStateException before `Sign`, and for a signature read from a tree.
   virtual Ref<ElementNode> GetElement() const = 0;
 
-  /// Checks what `Verify` checks, by the same rules, but goes on after a failure and reports everything. It computes the digests
-  /// of at most ten references even if no trusted key made the signature, so use it where a person waits for the answer.
+  /// Checks what `Verify` checks, by the same rules, but continues after a failure and reports everything. It computes
+  /// the digests of at most ten references even if no trusted key made the signature, so use it where a person waits
+  /// for the answer.
   /// @throws OutOfMemoryException, and InvalidStateException when OpenSSL has cleaned itself up, like `Verify`; also
-  ///         InvalidStateException for a blank signature before `Sign`. No content of the tree makes it throw, unless the element
-  ///         of a blank signature lost its syntax after `Sign`: then a SignatureSyntaxException, like `Verify`.
+  ///         InvalidStateException for a blank signature before `Sign`. No content of the tree makes it throw, with one
+  ///         exception: if the element of a blank signature was changed after `Sign` and has lost its syntax, it throws
+  ///         a SignatureSyntaxException, like `Verify`.
   virtual SignatureReport Explain(const KeyInfoResolver &resolver) const = 0;
 
 protected:

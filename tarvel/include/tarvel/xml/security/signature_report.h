@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// `SignatureReport`, what each rule of a signature's verification looked at and found.
+/// `SignatureReport`, what each rule of a signature's verification checked and found.
 
 #pragma once
 
@@ -19,22 +19,22 @@ namespace Tarvel::Xml::Security {
 enum class SignatureRule : std::uint8_t {
   PROFILE,    ///< algorithms, transforms and parts are those of the profile
   KEYS,       ///< a trusted key can be used with the signature's algorithm
-  REFERENCES, ///< each reference resolves to one node, and envelops the signature if it has that transform
+  REFERENCES, ///< each reference resolves to one node, which contains the signature if it is enveloped
   VALUE,      ///< a key made the signature's value
   DIGESTS     ///< each reference has the digest of its target
 };
 
-/// The result of `Signature::Explain`. Nothing of it may be trusted. Texts are as the sender wrote them. Pointers to elements
-/// are valid as long as the signature's tree.
+/// The result of `Signature::Explain`. None of it may be trusted. Texts are as the sender wrote them. Pointers to
+/// elements are valid as long as the signature's tree exists.
 struct SignatureReport {
-  /// One thing for which the signature is refused.
+  /// One reason to refuse the signature.
   struct Refusal {
-    SignatureRule rule = SignatureRule::PROFILE; ///< the rule that refuses it
+    SignatureRule rule = SignatureRule::PROFILE; ///< the rule that refuses the signature
     std::string message; ///< the text of the `XmlSecurityException` that `Verify` would throw; empty if
                          ///< `Verify` would return false
-    const ElementNode *element = nullptr; ///< where it is; null if there is no place
-    std::string found;  ///< what is there, shortened as in messages; the digest that was computed; may be empty
-    std::string wanted; ///< what the rule accepts there; the digest that the reference wants; may be empty
+    const ElementNode *element = nullptr; ///< the place; null if there is none
+    std::string found;  ///< what is there, shortened as in messages, or the computed digest; may be empty
+    std::string wanted; ///< what the rule accepts there, or the digest in the reference; may be empty
   };
 
   /// One reference.
@@ -44,10 +44,10 @@ struct SignatureReport {
     std::vector<std::string> transforms;    ///< the first ten
     std::string digestMethod;               ///< URI of the algorithm
     std::vector<std::uint8_t> digestWanted; ///< the octets of the DigestValue
-    /// Empty if it cannot be computed: there is no target, or it does not contain the signature although it should, or an
-    /// algorithm is refused, or there is no canonical form.
+    /// Empty if the digest cannot be computed: there is no target, or the target does not contain the signature
+    /// although it should, or an algorithm is refused, or there is no canonical form.
     std::vector<std::uint8_t> digestComputed;
-    bool digestMatches = false; ///< the computed digest is the wanted one
+    bool digestMatches = false; ///< whether the two digests are the same
   };
 
   /// A key that the resolver trusts.
@@ -58,23 +58,23 @@ struct SignatureReport {
     bool madeSignature = false;                 ///< it made the signature's value
   };
 
-  /// A certificate in the `KeyInfo`; it is shown only, and never becomes a key. One of more than 64 KiB is not read, unless it
-  /// is trusted.
+  /// A certificate in the `KeyInfo`. It is only shown, and never used as a key. A certificate of more than 64 KiB is
+  /// not read, unless it is trusted.
   struct NamedCertificate {
     std::string subject;    ///< empty if it cannot be read
-    std::string thumbprint; ///< SHA-256, as `Certificate::GetSha256Thumbprint`; empty if it cannot be read
-    bool isTrusted = false; ///< byte for byte the certificate of a trusted key
+    std::string thumbprint; ///< from `Certificate::GetSha256Thumbprint`; empty if it cannot be read
+    bool isTrusted = false; ///< whether it is, byte for byte, the certificate of a trusted key
   };
 
   std::string canonicalizationMethod;              ///< URI of the algorithm
   std::string signatureMethod;                     ///< URI of the algorithm
   std::vector<Reference> references;               ///< the first ten
-  std::vector<Key> keys;                           ///< all different ones that the resolver trusts, in order
+  std::vector<Key> keys;                           ///< all keys that the resolver trusts, each once, in order
   std::vector<NamedCertificate> namedCertificates; ///< the first 16 X509Certificate elements that contain only text
   /// In the order of the rules. Empty exactly when `Verify` returns true. Otherwise `Verify` throws an
   /// `XmlSecurityException` with the first message, or returns false if the first message is empty.
   std::vector<Refusal> refusals;
-  bool areDigestsComputed = false; ///< whether there are references, and the digests of all could be computed
+  bool areDigestsComputed = false; ///< whether there are references, and all their digests could be computed
   bool isValueChecked = false;     ///< whether at least one key could be tried
 };
 
