@@ -38,9 +38,9 @@ struct ServerRefusal {
     OTHER_THUMBPRINT ///< the server's certificate has another thumbprint than the expected one
   };
 
-  Kind kind = Kind::OTHER;
-  std::string text;      ///< in the words of an `SSLException`, without the endpoint
-  std::size_t depth = 0; ///< of the certificate in the chain that was verified; 0 is the server's
+  Kind kind = Kind::OTHER; ///< which kind of reason
+  std::string text;        ///< in the words of an `SSLException`, without the endpoint
+  std::size_t depth = 0;   ///< of the certificate in the chain that was verified; 0 is the server's
 
   /// That certificate, which need not be one of those that the server sent. Null for one that cannot be read, and for
   /// `OTHER_THUMBPRINT`.
@@ -62,11 +62,11 @@ struct HandshakeProbe {
     FAILED     ///< any other failure; see `failure`
   };
 
-  Outcome outcome = Outcome::FAILED;
+  Outcome outcome = Outcome::FAILED; ///< how the handshake ended
   std::string failure; ///< the message of the exception that a connection gets; empty if the server was accepted
-  std::int64_t durationMicroseconds = 0;
-  std::string version; ///< such as "TLSv1.3"; empty if none was agreed on
-  std::string cipher;  ///< the cipher suite's name; empty if none was agreed on
+  std::int64_t durationMicroseconds = 0; ///< of the handshake, without the connect
+  std::string version;                   ///< such as "TLSv1.3"; empty if none was agreed on
+  std::string cipher;                    ///< the cipher suite's name; empty if none was agreed on
 
   /// The certificates that the server sent, its own first. Null for one that cannot be read.
   Crypto::CertificateList chain;
@@ -90,16 +90,16 @@ struct AddressProbe {
     FAILED        ///< any other failure
   };
 
-  std::string address; ///< IPv4 or IPv6, without brackets
-  Outcome outcome = Outcome::FAILED;
-  std::string reason; ///< the system's text; empty if the address answered
-  std::int64_t durationMicroseconds = 0;
+  std::string address;                   ///< IPv4 or IPv6, without brackets
+  Outcome outcome = Outcome::FAILED;     ///< how the attempt ended
+  std::string reason;                    ///< the system's text; empty if the address answered
+  std::int64_t durationMicroseconds = 0; ///< of the attempt
 };
 
 /// What `ProbeServer` has found.
 struct ServerProbe {
-  std::string lookupFailure; ///< why the name has no address; empty if it has
-  std::int64_t lookupMicroseconds = 0;
+  std::string lookupFailure;           ///< why the name has no address; empty if it has
+  std::int64_t lookupMicroseconds = 0; ///< how long the look-up of the name took
   std::size_t addressCount = 0;        ///< how many addresses the name has, also those that were not tried
   std::vector<AddressProbe> addresses; ///< in the order in which a connection tries them
 
