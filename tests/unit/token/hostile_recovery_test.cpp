@@ -77,8 +77,8 @@ TEST(HostileAssertion, HasManyStatements) {
 }
 
 TEST(HostileAssertion, HasAMillionElementsInsteadOfItsOwn) {
-  // The parser searches the whole list for each of Issuer, Signature, Subject, Conditions and AuthnStatement. Each element
-  // is then refused, because it is not an attribute statement.
+  // The parser searches the whole list for each of Issuer, Signature, Subject, Conditions and AuthnStatement. Then it
+  // refuses each element, because none is an attribute statement.
   const std::string content = BearerAssertion();
   const std::size_t begin = content.find("<saml:Issuer");
   const std::string children = content.substr(begin, content.find("</saml:Assertion>") - begin);
