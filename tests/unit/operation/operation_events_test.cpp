@@ -331,7 +331,7 @@ public:
   bool wasSecretShown = false;
 };
 
-TEST(OperationEvents, EndExactlyOnceAndKeepTheExceptionWhicheverAllocationsFail) {
+TEST(OperationEvents, EndExactlyOnceAndKeepTheExceptionForEachAllocationThatFails) {
   const InvalidCredentialsException refusal("Authentication failed: not wonderland, a message longer than a buffer");
   const auto fault = ParseResponseDocument(*Tarvel::CreateStringReader(
       "<f><faultcode>a</faultcode><faultstring>it is not wonderland, you know that</faultstring></f>"));

@@ -24,7 +24,7 @@ std::string NameAt(const NodeFilterIterator &iterator) {
 
 /// The result of taking an element `x:e`.
 struct Taken {
-  std::string element;              ///< the one that was taken
+  std::string element;              ///< the name of the element that was taken
   std::string next;                 ///< where the cursor is afterwards
   std::vector<std::string> refused; ///< what was found at each node that was refused
 
