@@ -38,11 +38,11 @@ public:
   void AddPrefixOf(std::string_view qualifiedName, std::string_view masked) noexcept;
 
   /// `text` with "***" in place of secrets, printable (`Tarvel::StringUtil::Printable`), and cut at
-  /// `Tarvel::StringUtil::MAX_VALUE_BYTES` bytes, at whose end it then says how many bytes of `text` are missing. A
-  /// secret that the end of `text` or the cut would divide is masked, too. So is the markup of a token, a signature or
-  /// a password, whether or not it was added. The time is linear in the length of the text, and mostly far below: where
-  /// a hostile text would need more, the rest of it is masked. If there was no memory to add a secret, or there are more
-  /// than 100, every text becomes "***".
+  /// `Tarvel::StringUtil::MAX_VALUE_BYTES` bytes. A text that is cut ends with the number of bytes that are missing. A
+  /// secret that the cut divides is masked, too, and so are eight or more bytes of its beginning at the end of `text`.
+  /// The markup of a token, a signature or a password is masked, whether or not it was added. The time is at most linear
+  /// in the length of the text: if a hostile text needs more, the rest of it is masked. If there was no memory to add a
+  /// secret, or if there are more than 100, every text becomes "***".
   std::string Apply(std::string_view text) const;
 
 private:

@@ -33,7 +33,7 @@ public:
   std::vector<std::string> faults;
 };
 
-/// The fault with these children, as the listener of the response handler gets it.
+/// The line of a listener of the response handler for a fault with these children.
 std::string Heard(const std::string &children) {
   Recorder recorder;
   const auto handler = ResponseHandlerImpl().WithFaultListener(recorder);
@@ -53,7 +53,7 @@ TEST(ReadSoapFault, ResolvesThePrefixOfTheCode) {
   EXPECT_EQ(Heard("<faultcode>Server</faultcode>"), "{http://schemas.xmlsoap.org/soap/envelope/} Server:  ()");
 }
 
-TEST(ReadSoapFault, LeavesTheNamespaceOfAPrefixThatIsNotBoundEmpty) {
+TEST(ReadSoapFault, ReportsNoNamespaceForAnUnboundPrefix) {
   EXPECT_EQ(Heard("<faultcode>ns9:Odd</faultcode><faultstring>text</faultstring>"), "{} ns9:Odd: text ()");
 }
 
@@ -86,7 +86,7 @@ TEST(ReadSoapFault, ReadsOnlyTheFirstTextOfTheFaultString) {
             "{http://schemas.xmlsoap.org/soap/envelope/} a: one ()");
 }
 
-TEST(CheckSoapFault, ShowsTheFaultToTheListenerBeforeItThrowsTheSameException) {
+TEST(CheckSoapFault, ReportsTheFaultToTheListenerAndThrowsTheUsualException) {
   const std::string missing = Envelope("<soapenv:Fault/>");
   const std::string unbound = Envelope("<soapenv:Fault><faultcode>ns9:Odd</faultcode></soapenv:Fault>");
   Recorder recorder;
@@ -101,7 +101,7 @@ TEST(CheckSoapFault, ShowsTheFaultToTheListenerBeforeItThrowsTheSameException) {
   EXPECT_EQ(recorder.faults, (std::vector<std::string>{"{} :  ()", "{} ns9:Odd:  ()"}));
 }
 
-TEST(CheckSoapFault, ShowsNothingOfAResponseWithoutFault) {
+TEST(CheckSoapFault, ReportsNothingForAResponseWithoutFault) {
   Recorder recorder;
   CheckSoapFault(*ParseResponseDocument(*Tarvel::CreateStringReader(Envelope("<Fault2/>"))), &recorder);
   CheckSoapFault(*ParseResponseDocument(*Tarvel::CreateStringReader("<a><Fault/></a>")), &recorder);

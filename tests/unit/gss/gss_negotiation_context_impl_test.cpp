@@ -145,7 +145,7 @@ TEST(GssNegotiationContext, MasksALegThatTheServiceRepeats) {
   EXPECT_EQ(observer->Lines().back(), "ended InvalidCredentialsException: no ***");
 }
 
-TEST(GssNegotiationContext, HandsARefusedTokenToTheSink) {
+TEST(GssNegotiationContext, PassesARefusedTokenToTheSink) {
   Texts refused;
   ServiceOptions options;
   options.refusedTokenSink = [&](const std::string &xml) { refused.push_back(xml); };

@@ -44,7 +44,7 @@ FailingAllocations::~FailingAllocations() {
 
 #ifndef TESTING_IS_SANITIZED
 #pragma GCC visibility push(default)
-// Replaces the C library's function, with which the standard clocks are read.
+// Replaces the C library's function, which the standard clocks call.
 extern "C" int clock_gettime(clockid_t clock, timespec *time) noexcept {
   ++Testing::g_work.clockReads;
   return static_cast<int>(syscall(SYS_clock_gettime, clock, time));

@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// Counts allocations and looks at the clock, and lets allocations fail.
+/// Counts allocations and reads of the clock, and lets allocations fail.
 
 #pragma once
 
@@ -22,7 +22,7 @@ struct CountedWork {
 
 CountedWork CountWork() noexcept;
 
-/// While it exists, an allocation of this thread fails: the n-th one, or that one and all later ones.
+/// While it exists, the n-th allocation of this thread fails, and all later ones, too, unless `failsOnce`.
 class FailingAllocations {
 public:
   FailingAllocations(long n, bool failsOnce) noexcept;

@@ -33,7 +33,7 @@ using Texts = std::vector<std::string>;
 
 const std::string ID = "00000000-0000-4000-8000-00000000000a";
 
-/// A session whose answer is a function of the test.
+/// A session that answers with a function of the test.
 class Session final : public TransportSession {
 public:
   explicit Session(std::function<void(const Request &, Tarvel::Ref<Tarvel::Reader> &)> send)
@@ -56,7 +56,7 @@ Request IssueRequest() {
   return request;
 }
 
-/// Runs an operation with one exchange, in which the transport knows these facts and then throws or answers.
+/// Runs an operation with one exchange: the transport sets these facts, calls `fail`, and answers unless `fail` throws.
 Texts LinesOf(const ResponseFacts &facts, const std::function<void()> &fail) {
   RecordedEvents observer;
   OperationEvents events(&observer, "Operation", ID);
@@ -178,7 +178,7 @@ TEST(OperationEvents, MaskSecretsInEveryText) {
       return 1;
     });
   };
-  // The exception keeps the text.
+  // The exception itself is not masked.
   EXPECT_THROWS_MESSAGE(run(), SsoException, "Unexpected SOAP fault: w:wonderland; request failed.");
   EXPECT_EQ(observer.Lines(), (Texts{"started Operation", "sent urn:issue", "received 500 bad ***, text/***",
                                      "fault {urn:***}*** w:***: No *** (***)",
@@ -266,7 +266,7 @@ TEST(OperationEvents, LogWhatTheObserverThrowsAndKeepTheException) {
   EXPECT_EQ(observer.ends, 1);
 }
 
-TEST(OperationEvents, AreNotLoggedBelowTheLevelOfWarnings) {
+TEST(OperationEvents, LogNothingBelowTheLevelOfWarnings) {
   const Testing::ScopedLogLevel level(LOG_LEVEL_CONTRACT_WARNING - 1);
   const Testing::RecordedLog log;
   ThrowingObserver observer;
@@ -303,7 +303,7 @@ TEST(OperationEvents, ComputeNothingWithoutAnObserver) {
   EXPECT_EQ(token.CountCalls(), 0);
 }
 
-TEST(OperationEvents, AreCountedWhenThereIsAnObserver) { // so the test above would notice
+TEST(OperationEvents, AllocateAndReadTheClockWithAnObserver) { // so the test above is able to fail
   RecordedEvents observer;
   const Testing::CountedWork before = Testing::CountWork();
   OperationEvents events(&observer, "an operation with a name that is longer than a string's own buffer", ID);
@@ -331,7 +331,7 @@ public:
   bool wasSecretShown = false;
 };
 
-TEST(OperationEvents, EndExactlyOnceAndKeepTheExceptionWhicheverAllocationsFail) {
+TEST(OperationEvents, EndExactlyOnceAndKeepTheExceptionForEachAllocationThatFails) {
   const InvalidCredentialsException refusal("Authentication failed: not wonderland, a message longer than a buffer");
   const auto fault = ParseResponseDocument(*Tarvel::CreateStringReader(
       "<f><faultcode>a</faultcode><faultstring>it is not wonderland, you know that</faultstring></f>"));
@@ -362,7 +362,7 @@ TEST(OperationEvents, EndExactlyOnceAndKeepTheExceptionWhicheverAllocationsFail)
       starts += observer.starts;
     }
   }
-  EXPECT_GT(starts, rounds / 2); // most failures come after the start
+  EXPECT_GT(starts, rounds / 2); // most failures are after the start
 }
 
 } // namespace

@@ -50,7 +50,7 @@ TEST(SecretMask, MasksAPasswordInBase64) {
   EXPECT_EQ(Masked("wonderland", "[" + Base64("wonderland") + "]"), "[***]");
 }
 
-TEST(SecretMask, MasksAPasswordFromWhichTheServiceRemovedTheBlanksAroundIt) {
+TEST(SecretMask, MasksAPasswordThatTheServiceHasTrimmed) {
   EXPECT_EQ(Masked(" wonderland\n", "[wonderland]"), "[***]");
   EXPECT_EQ(Masked(" wonderland\n", "[" + Base64("wonderland") + "]"), "[***]");
   EXPECT_EQ(Masked(" wonderland\n", "[ wonderland\n]"), "[***]");
@@ -91,11 +91,11 @@ TEST(SecretMask, MasksTheBeginningOfASecretAtTheEndOfAText) {
   EXPECT_EQ(Masked("correct-horse-battery", "You sent correct"), "You sent correct");
 }
 
-TEST(SecretMask, CutsLongTextsAndSaysHowMuchIsMissing) {
+TEST(SecretMask, CutsLongTextsAndShowsHowMuchIsMissing) {
   const std::string most(StringUtil::MAX_VALUE_BYTES, '.');
   EXPECT_EQ(Masked("secret", most), most);
   EXPECT_EQ(Masked("secret", most + "12345"), most + "... (5 more bytes)");
-  // A character is not divided, and a secret counts with all its bytes.
+  // A character is not divided, and all bytes of a secret count.
   EXPECT_EQ(Masked("secret", most.substr(1) + "\xC3\xBC!"), most.substr(1) + "... (3 more bytes)");
   EXPECT_EQ(Masked("secret", most + "secret"), most + "... (6 more bytes)");
 }
@@ -143,7 +143,7 @@ TEST(SecretMask, IgnoresEmptyValuesAndTextThatIsNotXml) {
   EXPECT_EQ(mask.Apply("any text"), "any text");
 }
 
-// A service may repeat a token that is not this operation's, or write it in another form.
+// A service may repeat a token that is not this operation's, or this operation's token in another form.
 TEST(SecretMask, MasksTheMarkupOfEachSecretElement) {
   const std::pair<const char *, const char *> cases[] = {
       {"[<saml2:Assertion ID='x'>any</saml2:Assertion>]", "[***>]"},
@@ -162,13 +162,13 @@ TEST(SecretMask, MasksTheMarkupOfEachSecretElement) {
   }
 }
 
-TEST(SecretMask, GivesUpOnSecretsThatOverlapForAMegabyteAndMasksTheRest) {
+TEST(SecretMask, MasksAllTextAfterAMegabyteOfSecretsThatOverlap) {
   const std::size_t megabyte = 1u << 20;
   EXPECT_EQ(Masked("aa", std::string(megabyte - 10, 'a') + " text"), "*** text");
   EXPECT_EQ(Masked("aa", std::string(megabyte + 10, 'a') + " text"), "***");
 }
 
-// Each of these took minutes if every position of the text were compared with the whole rest of it.
+// Each of these would take minutes if every position of the text were compared with the whole rest of the text.
 TEST(SecretMask, EndsInLinearTimeForHostileTexts) {
   const std::size_t length = 10u << 20;
   EXPECT_LE(Masked(std::string(1000, 'a'), std::string(length, 'a')).size(), 2000u);

@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
-// Whichever allocation of an observed operation fails: the operation ends as it would without an observer or for lack of
-// memory, each start has one end, and no event shows a secret.
+// Lets each allocation of an observed operation fail. The operation ends as it does without an observer, or for lack of
+// memory. Each start has one end, and no event shows a secret.
 #include "exchange/response_handler_impl.h"
 #include "support/service_stand_ins.h"
 #include "support/soap_responses.h"
@@ -52,7 +52,7 @@ Outcome OutcomeOf(const SecurityTokenService &service, const std::string &passwo
     return Outcome::REFUSED;
   } catch (const std::bad_alloc &) {
     return Outcome::NO_MEMORY;
-  } catch (...) { // is the outcome; NOLINT(bugprone-empty-catch)
+  } catch (...) { // the outcome is OTHER; NOLINT(bugprone-empty-catch)
   }
   return Outcome::OTHER;
 }
@@ -87,7 +87,7 @@ TEST(ObservedServiceWithoutMemory, ReportsOneEndForEachStartAndKeepsTheOutcome) 
       EXPECT_FALSE(observer->showsSecret) << failing;
       refusals += outcome == Outcome::REFUSED ? 1 : 0;
     }
-    // A lack of memory that ends soon often costs events only.
+    // A short lack of memory often costs only events.
     EXPECT_GT(refusals, failsOnce ? allocations / 4 : 0);
   }
 }

@@ -1,7 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// The operations of a service whose network is replaced, with an observer: request builder and response handler are
-/// real.
+/// The operations of an observed service. Only its network is replaced: request builder and response handler are real.
 
 #pragma once
 
@@ -45,9 +44,9 @@ inline const SsoClient::SamlToken &HeldToken() {
 struct ObservedOperation {
   const char *name;
   const char *action;
-  std::string leg; ///< what its lines about messages end with
+  std::string leg; ///< the end of its lines about messages
   std::function<void(const SsoClient::SecurityTokenService &)> run;
-  std::function<std::string(const std::string &)> respond; ///< the response that contains a token
+  std::function<std::string(const std::string &)> respond; ///< makes a response from the text of a token
 };
 
 inline void PrintTo(const ObservedOperation &operation, std::ostream *out) {

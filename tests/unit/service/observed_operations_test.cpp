@@ -113,7 +113,7 @@ TEST_P(EachObservedTokenOperation, ReportsARefusedToken) {
             Lines("200 OK, text/xml", {"ended SsoException: The token has expired at: 2021-01-01T00:00:00.000Z"}));
 }
 
-TEST_P(EachObservedTokenOperation, HandsARefusedTokenToTheSinkBeforeItThrows) {
+TEST_P(EachObservedTokenOperation, PassesARefusedTokenToTheSinkBeforeItThrows) {
   for (const char *name : {"signed-by-other", "expired"}) {
     Texts refused;
     ServiceOptions options;
@@ -128,7 +128,7 @@ TEST_P(EachObservedTokenOperation, HandsARefusedTokenToTheSinkBeforeItThrows) {
   }
 }
 
-TEST_P(EachObservedTokenOperation, HandsNothingElseToTheSink) {
+TEST_P(EachObservedTokenOperation, PassesNothingElseToTheSink) {
   const std::string token = ReadDataFile("tokens/bearer.xml");
   ServiceOptions options;
   options.refusedTokenSink = [](const std::string &) { FAIL(); };
@@ -193,7 +193,7 @@ TEST(ObservedOperation, ReportsAResponseWithoutTokenAsSuccess) {
   EXPECT_EQ(observer->Lines().back(), "ended");
 }
 
-/// The lines of a negotiation with these handlers' legs and the service's responses.
+/// The lines of a negotiation with this handler and these responses of the service.
 Texts LinesOfNegotiation(NegotiationHandler &handler, const Texts &responses) {
   const auto observer = std::make_shared<RecordedEvents>();
   ServiceOptions options;
@@ -216,7 +216,7 @@ TEST(ObservedNegotiation, ReportsEachLeg) {
                    "received 200 OK, text/xml, leg 2", "ended"}));
 }
 
-TEST(ObservedNegotiation, ReportsAnExceptionClassOfTheHandler) {
+TEST(ObservedNegotiation, ReportsTheClassOfAnExceptionOfTheHandler) {
   struct ForeignFailure {};
   class Handler final : public NegotiationHandler {
   public:
@@ -225,8 +225,8 @@ TEST(ObservedNegotiation, ReportsAnExceptionClassOfTheHandler) {
   EXPECT_EQ(LinesOfNegotiation(handler, {}), (Texts{"started AcquireTokenByGSS", "ended ForeignFailure: "}));
 }
 
-// An asynchronous operation that throws a foreign class does not call its completion, but its end is reported.
-TEST(ObservedAsyncOperation, ReportsItsEndAlsoForAForeignClass) {
+// An asynchronous operation that throws a foreign class does not call its completion, but it reports its end.
+TEST(ObservedAsyncOperation, ReportsItsEndAlsoForAnExceptionOfAForeignClass) {
   class Handler final : public NegotiationHandler {
   public:
     std::shared_ptr<Bytes> NegotiateLeg(const Bytes &) override { throw 7; }
@@ -273,7 +273,7 @@ TEST(ObservedAsyncOperation, ReportsTheEventsOfEachOperationInOrderWhenManyRunAt
   }
 }
 
-TEST(CreateSecurityTokenService, TakesAnObserverOrNone) {
+TEST(CreateSecurityTokenService, AcceptsAnObserverOrNull) {
   SecurityTokenServiceConfig config;
   config.stsUrl = "http://127.0.0.1:1/";
   const auto observer = std::make_shared<RecordedEvents>();

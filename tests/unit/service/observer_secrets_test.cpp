@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
-// No event and no log line contains the password, the token or a signature value of an operation, whatever the service
-// repeats, however the operation fails, and at every level of the log.
+// No event and no log line contains the password, the token or a signature value of an operation: for everything that
+// the service can repeat, for each way in which the operation can fail, and at every level of the log.
 #include "unit/service/observed_operations.h"
 
 #include "support/recorded_log.h"
@@ -63,7 +63,7 @@ bool HasPassword(const std::string &request) {
   return request.find("canary-") != std::string::npos;
 }
 
-/// The texts that must not be seen, and beginnings of them.
+/// The texts that must not be seen: parts of the secrets.
 Texts Canaries(const std::string &request) {
   Texts canaries = {"NameID", "X509Data"};
   if (HasPassword(request)) {
@@ -174,7 +174,7 @@ TEST_P(EchoingService, GetsNoSecretIntoAnEventOrTheLog) {
 INSTANTIATE_TEST_SUITE_P(Service, EchoingService, testing::ValuesIn(ECHOES),
                          [](const auto &echo) { return std::string(echo.param.name); });
 
-// So that the test above would notice: the exception contains what the service repeats.
+// Shows that the test above is able to fail: the exception contains what the service repeats.
 TEST(EchoedPassword, StaysInTheExceptionOnly) {
   const auto observer = std::make_shared<RecordedEvents>();
   ServiceOptions options;
@@ -207,8 +207,8 @@ TEST(EchoedPassword, OfOneCharacterIsMaskedEverywhere) {
   EXPECT_EQ(observer->LastFault().codeName, "***");
 }
 
-// Whatever the text of a token looks like: the caller may have an implementation of its own.
-TEST(EchoedToken, IsMaskedAsTheOperationGotIt) {
+// The text of a token can have any form, because the caller may implement `SamlToken` itself.
+TEST(EchoedToken, IsMaskedInTheFormThatTheOperationReceived) {
   const TokenStandIn token("_1", "token text", SamlToken::HOLDER_OF_KEY);
   const std::function<void(const SecurityTokenService &)> operations[] = {
       [&](const SecurityTokenService &service) { service.AcquireTokenByToken(token, SpecFor(60)); },
@@ -244,8 +244,8 @@ TEST(RefusedToken, IsMaskedInTheMessageOfItsRefusal) {
                                       "algorithm \"***\" is not accepted");
 }
 
-// A code is divided at its colon, and an exception quotes its prefix alone.
-TEST(EchoedPassword, WithAColonIsMaskedAsTheCode) {
+// A code is divided at its colon, and an exception quotes only the prefix.
+TEST(EchoedPassword, WithAColonIsMaskedInTheCode) {
   const auto observer = std::make_shared<RecordedEvents>();
   ServiceOptions options;
   options.observer = observer;

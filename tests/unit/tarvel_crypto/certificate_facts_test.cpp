@@ -35,7 +35,7 @@ TEST(ReadCertificateFacts, AcceptsTheKeysWhoseSignaturesAreAccepted) {
   EXPECT_EQ("", FactsOf("tokens/sts-rsa-e3.crt").keyRefusal);
 }
 
-TEST(ReadCertificateFacts, SaysWhyNoSignatureByTheKeyIsAccepted) {
+TEST(ReadCertificateFacts, StatesWhyNoSignatureByTheKeyIsAccepted) {
   EXPECT_EQ("the RSA key has only 1024 bits; 2048 are the minimum", FactsOf("crypto/rsa1024.crt").keyRefusal);
   const std::string kind = "the key is neither RSA nor on the curves P-256, P-384 and P-521";
   EXPECT_EQ(kind, FactsOf("crypto/p224.crt").keyRefusal);

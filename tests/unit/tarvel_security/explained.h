@@ -34,7 +34,7 @@ inline Explained Explain(std::string_view text, const std::vector<std::string> &
   return Explain(text, *Tarvel::Xml::Security::CreateTrustSetKeyResolver(Trusted(trusted)));
 }
 
-/// What `Verify` does by a report: "accepted", "wrong", or the message of the exception.
+/// What `Verify` does according to a report: "accepted", "wrong", or the message of the exception.
 inline std::string VerdictOf(const Tarvel::Xml::Security::SignatureReport &report) {
   if (report.refusals.empty()) {
     return "accepted";
@@ -42,7 +42,7 @@ inline std::string VerdictOf(const Tarvel::Xml::Security::SignatureReport &repor
   return report.refusals.front().message.empty() ? "wrong" : report.refusals.front().message;
 }
 
-/// What `Verify` does.
+/// What `Verify` does, in the same words.
 inline std::string VerdictOf(const Tarvel::Xml::Security::Signature &signature,
                              const Tarvel::Xml::Security::KeyInfoResolver &resolver) {
   std::set<std::string> uris;

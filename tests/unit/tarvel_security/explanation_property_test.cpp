@@ -1,5 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
-// The report on a signature agrees with its verification, whatever the document.
+// The report on a signature agrees with its verification for every document.
 
 #include "explained.h"
 #include "genuine_token.h"
@@ -31,7 +31,7 @@ using Testing::IdOf;
 using Testing::Trusted;
 using Testing::VerdictOf;
 
-/// The signatures of a document, as far as they have the syntax of one.
+/// The `Signature` elements of a document that have the syntax of a signature.
 std::vector<Ref<Signature>> SignaturesOf(const Document &document) {
   std::vector<Ref<Signature>> signatures;
   const Node *node = document.GetDocumentElement();
@@ -56,7 +56,7 @@ std::vector<Ref<Signature>> SignaturesOf(const Document &document) {
   return signatures;
 }
 
-/// Resolvers that trust nothing, one key, keys between which KeyInfo chooses, and keys of all kinds.
+/// Resolvers that trust no key, one key, keys from which KeyInfo selects, and keys of all kinds.
 const std::vector<Ref<KeyInfoResolver>> &Resolvers() {
   static const std::vector<Ref<KeyInfoResolver>> RESOLVERS = {
       CreateTrustSetKeyResolver({}), CreateTrustSetKeyResolver(Trusted({"sts-rsa"})),
@@ -75,7 +75,7 @@ bool ShowsAllChecks(const SignatureReport &report) {
                      [](const auto &reference) { return reference.target && reference.digestMatches; });
 }
 
-/// Adds the verdicts on all signatures of a text that parses, after it has compared them with the reports.
+/// Compares the verdicts on all signatures of a text with the reports and adds them. Ignores text that does not parse.
 void Compare(const std::string &text, const std::string &name, std::set<std::string> &verdicts) {
   Ref<Document> document;
   try {
@@ -97,7 +97,7 @@ void Compare(const std::string &text, const std::string &name, std::set<std::str
   }
 }
 
-TEST(Explain, AgreesWithVerifyOverEveryDocumentOfTheTestData) {
+TEST(Explain, AgreesWithVerifyForEveryDocumentOfTheTestData) {
   std::set<std::string> verdicts;
   for (const auto &entry : std::filesystem::recursive_directory_iterator(Testing::DataPath(""))) {
     if (entry.path().extension() == ".xml") {
@@ -110,7 +110,7 @@ TEST(Explain, AgreesWithVerifyOverEveryDocumentOfTheTestData) {
   EXPECT_LE(40u, verdicts.size());
 }
 
-TEST(Explain, AgreesWithVerifyWhateverCharacterOfASignatureIsChanged) {
+TEST(Explain, AgreesWithVerifyForEveryChangedCharacterOfASignature) {
   const std::string text = GenuineToken();
   const std::size_t end = text.find("</ds:Signature>");
   std::set<std::string> verdicts;
@@ -161,7 +161,7 @@ std::string Applied(const std::string &text, const Change &change) {
   return text.find(change.from) == std::string::npos ? text : Testing::Replaced(text, change.from, change.to);
 }
 
-TEST(Explain, AgreesWithVerifyForEachTwoOfManyChanges) {
+TEST(Explain, AgreesWithVerifyForEachPairOfChanges) {
   std::set<std::string> verdicts;
   for (const char *const name : {"tokens/rsa-sha256.xml", "tokens/reference-two.xml"}) {
     const std::string token = Testing::ReadDataFile(name);

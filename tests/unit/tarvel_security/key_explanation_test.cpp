@@ -48,14 +48,14 @@ std::string CertificateElement(const std::string &text) {
   return "<ds:X509Certificate>" + text + "</ds:X509Certificate>";
 }
 
-/// The genuine token with that content of its only ds:X509Data, which is not signed.
+/// The genuine token with this content in its only ds:X509Data, which is not signed.
 std::string WithCertificates(const std::string &content) {
   const std::string text = GenuineToken();
   const std::size_t begin = text.find("<ds:X509Data>") + 13;
   return std::string(text).replace(begin, text.find("</ds:X509Data>") - begin, content);
 }
 
-/// For each key "named", "usable" and "made", as far as they are true.
+/// For each key, those of the words "named", "usable" and "made" that are true.
 Texts KeysOf(const Explained &explained) {
   Texts keys;
   for (const SignatureReport::Key &key : explained.report.keys) {
@@ -94,7 +94,7 @@ TEST(Explain, ShowsWhichKeyTheKeyInfoSelects) {
   EXPECT_EQ((Texts{"usable ", "named usable made"}), KeysOf(explained));
 }
 
-TEST(Explain, ShowsThatTheKeyInfoContainsTheOnlyTrustedKeyOrAllOfThem) {
+TEST(Explain, ShowsThatTheKeyInfoContainsEveryTrustedKey) {
   EXPECT_EQ(Texts{"named usable made"},
             KeysOf(Explain(WithCertificates(CertificateElement(Base64Of("sts-rsa"))), {"sts-rsa"})));
   EXPECT_EQ(
@@ -103,21 +103,21 @@ TEST(Explain, ShowsThatTheKeyInfoContainsTheOnlyTrustedKeyOrAllOfThem) {
                      {"other", "sts-rsa"})));
 }
 
-TEST(Explain, NamesNoKeyForAnotherCertificateOfIt) {
+TEST(Explain, NamesNoKeyForAnotherCertificateOfTheSameKey) {
   const Explained explained =
       Explain(WithCertificates(CertificateElement(Base64Of("sts-rsa-reissued"))), {"other", "sts-rsa"});
   EXPECT_EQ((Texts{"usable ", "usable made"}), KeysOf(explained));
   EXPECT_EQ(Texts{SubjectOf("sts-rsa-reissued")}, NamesOf(explained));
 }
 
-/// What a refusal says if a trusted key made the signature, but KeyInfo selects another one.
+/// The text of a refusal if a trusted key made the signature, but KeyInfo selects another key.
 std::string UnselectedMaker(const std::string &name) {
   const auto certificate = Trusted({name}).front();
   return "a signature by the trusted key of \"" + certificate->GetSubject() + "\" (SHA-256 thumbprint " +
          certificate->GetSha256Thumbprint() + "), which KeyInfo does not select";
 }
 
-TEST(Explain, ShowsThatATrustedKeyMadeTheSignatureWhichTheKeyInfoDoesNotSelect) {
+TEST(Explain, ShowsThatAnUnselectedTrustedKeyMadeTheSignature) {
   const Explained explained = Explain(WithCertificates(CertificateElement(Base64Of("other"))), {"sts-rsa", "other"});
   EXPECT_EQ(Texts{"VALUE\n\nds:SignatureValue\n" + UnselectedMaker("sts-rsa") + "\na signature by a trusted key"},
             RefusalsOf(explained));
@@ -186,7 +186,7 @@ TEST(Explain, DescribesAtMostTenKeysInOneText) {
   EXPECT_EQ(found + ", and 2 more", Explain(GenuineToken(), resolver).report.refusals.front().found);
 }
 
-TEST(Explain, ListsDifferentCandidatesOnceAndNoNulls) {
+TEST(Explain, ListsEachCandidateOnceAndNoNulls) {
   const FunctionResolver resolver([](const ElementNode *) {
     CertificateList candidates = Trusted({"sts-rsa", "sts-rsa", "other"});
     candidates.insert(candidates.begin(), nullptr);
@@ -215,7 +215,7 @@ TEST(Explain, ShowsThatTheKeysCannotBeReadAndChecksTheDigests) {
   EXPECT_TRUE(explained.report.keys.empty());
 }
 
-TEST(Explain, AcceptsIfOnlyTheKeysThatAreNotSelectedCannotBeRead) {
+TEST(Explain, AcceptsIfOnlyUnselectedKeysCannotBeRead) {
   const FunctionResolver resolver([](const ElementNode *keyInfo) {
     if (!keyInfo) {
       throw Tarvel::Xml::Security::XmlSecurityException("which keys?");
@@ -227,7 +227,7 @@ TEST(Explain, AcceptsIfOnlyTheKeysThatAreNotSelectedCannotBeRead) {
   EXPECT_EQ(Texts{"named usable made"}, KeysOf(explained));
 }
 
-TEST(Explain, LetsExceptionsPassThatAreNoVerdict) {
+TEST(Explain, PassesOnExceptionsThatAreNotVerdicts) {
   const FunctionResolver cleanedUp([](const ElementNode *) -> CertificateList {
     throw Tarvel::InvalidStateException("OpenSSL has cleaned itself up");
   });
@@ -244,7 +244,7 @@ TEST(Explain, LetsExceptionsPassThatAreNoVerdict) {
 
 // Certificates in KeyInfo
 
-TEST(Explain, NamesACertificateOfAStrangerAndNeverTriesItsKey) {
+TEST(Explain, NamesAnUntrustedCertificateAndNeverTriesItsKey) {
   const Explained explained =
       Explain(Replaced(ReadDataFile("tokens/signed-by-other.xml"), "<ds:KeyInfo>",
                        "<ds:KeyInfo><ds:X509Data>" + CertificateElement(Base64Of("other")) + "</ds:X509Data>"),
@@ -258,7 +258,7 @@ TEST(Explain, NamesACertificateOfAStrangerAndNeverTriesItsKey) {
   EXPECT_FALSE(stranger.isTrusted);
 }
 
-TEST(Explain, NamesTrustedCertificatesAndStrangersInTheirOrder) {
+TEST(Explain, NamesTrustedAndUntrustedCertificatesInTheirOrder) {
   const Explained explained = Explain(
       WithCertificates(CertificateElement(Base64Of("other")) + CertificateElement("\n" + Base64Of("sts-rsa") + "\n")),
       {"sts-rsa"});
@@ -267,7 +267,7 @@ TEST(Explain, NamesTrustedCertificatesAndStrangersInTheirOrder) {
   EXPECT_EQ(Trusted({"sts-rsa"}).front()->GetSha256Thumbprint(), explained.report.namedCertificates[1].thumbprint);
 }
 
-TEST(Explain, ListsCertificatesThatDoNotDecodeWithoutAName) {
+TEST(Explain, ListsUndecodableCertificatesWithoutAName) {
   const std::string text = Base64Of("other");
   const Explained explained = Explain(WithCertificates(
       CertificateElement("!") + CertificateElement(" ") + CertificateElement("AAAA") +
@@ -287,7 +287,7 @@ TEST(Explain, ListsNoCertificatesWithoutKeyInfo) {
   EXPECT_EQ((Texts{"usable made", "usable "}), KeysOf(explained));
 }
 
-/// A certificate with an extension of that many bytes, in DER form.
+/// A certificate in DER with an extension of this many bytes.
 std::vector<std::uint8_t> LargeCertificate(std::size_t extensionBytes) {
   const std::vector<std::uint8_t> small = Trusted({"other"}).front()->GetDer();
   const unsigned char *position = small.data();
@@ -309,7 +309,7 @@ std::vector<std::uint8_t> LargeCertificate(std::size_t extensionBytes) {
   return der;
 }
 
-TEST(Explain, DoesNotReadAStrangersCertificateOfMoreThan64KiB) {
+TEST(Explain, DoesNotReadAnUntrustedCertificateOfMoreThan64KiB) {
   const std::size_t overhead = LargeCertificate(64000).size() - 64000;
   const std::vector<std::uint8_t> largest = LargeCertificate(64 * 1024 - overhead);
   const std::vector<std::uint8_t> tooLarge = LargeCertificate(64 * 1024 - overhead + 1);

@@ -68,7 +68,7 @@ TEST(Explain, ReturnsTheSameReportEachTime) {
 
 // Profile
 
-TEST(Explain, ShowsTheAcceptedSignatureAlgorithmsForAnotherOneAndStillComputesTheDigests) {
+TEST(Explain, ShowsTheAcceptedSignatureAlgorithmsForAnUnknownOneAndStillComputesTheDigests) {
   const Explained explained = ExplainReplaced(Uri::RSA_SHA256, "urn:other");
   ASSERT_EQ(1u, explained.report.refusals.size());
   const SignatureReport::Refusal &refusal = explained.report.refusals.front();
@@ -106,7 +106,7 @@ TEST(Explain, ListsOnlyUrisThatAreAccepted) {
   }
 }
 
-TEST(Explain, ComputesNoDigestWithAnotherDigestAlgorithm) {
+TEST(Explain, ComputesNoDigestWithAnUnknownDigestAlgorithm) {
   const Explained explained = ExplainReplaced(Uri::DIGEST_SHA256, "urn:other");
   EXPECT_EQ((Texts{"PROFILE\nThe digest algorithm \"urn:other\" is not accepted\nds:DigestMethod\nurn:other\n"
                    "http://www.w3.org/2001/04/xmlenc#sha256, http://www.w3.org/2001/04/xmldsig-more#sha384, "
@@ -130,7 +130,7 @@ TEST(Explain, ComputesTheDigestsOfTheOtherReferences) {
   EXPECT_FALSE(explained.report.areDigestsComputed);
 }
 
-TEST(Explain, ComputesNoDigestWithAnotherTransform) {
+TEST(Explain, ComputesNoDigestWithAnUnknownTransform) {
   const Explained explained = ExplainReplaced(Uri::ENVELOPED_SIGNATURE, "urn:other");
   EXPECT_EQ((Texts{"PROFILE\nThe transform algorithm \"urn:other\" is not accepted\nds:Transform\nurn:other\n"
                    "http://www.w3.org/2000/09/xmldsig#enveloped-signature, " +
@@ -141,7 +141,7 @@ TEST(Explain, ComputesNoDigestWithAnotherTransform) {
   EXPECT_TRUE(explained.report.references.front().digestComputed.empty());
 }
 
-TEST(Explain, ChecksNoValueWithAnotherCanonicalization) {
+TEST(Explain, ChecksNoValueWithAnUnknownCanonicalization) {
   const Explained explained = ExplainReplaced(EXCLUSIVE, "urn:other");
   EXPECT_EQ((Texts{"PROFILE\nThe canonicalization algorithm \"urn:other\" is not accepted\n"
                    "ds:CanonicalizationMethod\nurn:other\n" +
@@ -250,7 +250,7 @@ TEST(Explain, ComputesNoDigestsWithoutReferences) {
   EXPECT_FALSE(explained.report.areDigestsComputed);
 }
 
-/// The genuine token with its reference that often; the last one has the identifier "last".
+/// The genuine token with its reference `count` times. The last one has the identifier "last".
 std::string WithReferences(int count) {
   std::string text = GenuineToken();
   const std::size_t begin = text.find("<ds:Reference");

@@ -109,7 +109,7 @@ TEST(Explain, ComputesNoDigestOfATargetThatDoesNotEnvelopTheSignature) {
   EXPECT_FALSE(explained.report.areDigestsComputed);
 }
 
-TEST(Explain, ComputesNoDigestOfNothing) {
+TEST(Explain, ComputesNoDigestIfOnlyTheSignatureIsCovered) {
   std::string text = ReadDataFile("tokens/reference-empty-uri.xml");
   const std::size_t begin = text.find("<ds:Signature ");
   text = text.substr(begin, text.find("</ds:Signature>") + 15 - begin);
@@ -198,7 +198,7 @@ TEST(Explain, ShowsThatSignedInfoHasNoCanonicalFormAndChecksTheDigests) {
   EXPECT_TRUE(explained.report.references.front().digestMatches);
 }
 
-// Several at once
+// Several refusals at once
 
 /// The rules of the refusals with their messages, in order.
 Texts RulesOf(const Explained &explained) {
@@ -209,7 +209,7 @@ Texts RulesOf(const Explained &explained) {
   return rules;
 }
 
-TEST(Explain, ShowsEverythingOfTheProfileInTheOrderOfVerify) {
+TEST(Explain, ShowsAllRefusalsOfTheProfileInTheOrderOfVerify) {
   std::string text = Replaced(GenuineToken(), "</ds:Signature>", "<ds:Object/></ds:Signature>");
   text = Replaced(text, "http://www.w3.org/2001/10/xml-exc-c14n#", "urn:c14n");
   text = Replaced(text, Uri::RSA_SHA256, "urn:signature");

@@ -42,14 +42,14 @@ using Testing::TlsSettings;
 constexpr std::int64_t PATIENCE = 60'000'000;
 constexpr std::int64_t IMPATIENCE = 50'000;
 
-/// Handshakes, and keeps what the client sends afterwards, as far as TLS lets it through.
+/// Does the handshake, and keeps the data that the client sends after it.
 class ListeningServer {
 public:
   explicit ListeningServer(const TlsSettings &settings)
       : m_server([this](ServerConnection &peer) { Serve(peer); }, settings) {}
 
   int GetPort() const noexcept { return m_server.GetPort(); }
-  /// What the first client has sent after its handshake. Waits until that client ends the connection.
+  /// What the first client has sent after its handshake. Waits until it sends something or ends the connection.
   std::string GetReceived() { return m_received.get_future().get(); }
 
 private:
@@ -59,7 +59,7 @@ private:
   }
 
   std::promise<std::string> m_received;
-  ScriptedServer m_server; // last: its scripts use the rest
+  ScriptedServer m_server; // last, because its scripts use the other members
 };
 
 TlsSettings Settings(const std::string &certificate, int version = 0) {
@@ -115,7 +115,7 @@ TEST(ProbeServer, ShowsWhatAnAcceptedHandshakeAgreedOn) {
   EXPECT_EQ(TlsCertificate("authority")->GetSha256Thumbprint(), probe.anchor->GetSha256Thumbprint());
 }
 
-TEST(ProbeServer, RefusesAServerWithTheTextOfAConnectionAndShowsItsFactsAllTheSame) {
+TEST(ProbeServer, RefusesAServerWithTheTextOfAConnectionAndStillShowsItsFacts) {
   struct Case {
     std::string certificate;
     std::string reason;
@@ -213,7 +213,7 @@ TEST(ProbeServer, RecognisesAServerThatOffersOnlyOldVersions) {
   EXPECT_THAT(probe.chain, IsEmpty());
 }
 
-/// The beginning of a handshake of TLS 1.2 in the clear: the server's hello, and the header of a message "certificate" of
+/// The unencrypted beginning of a TLS 1.2 handshake: the server's hello, and the header of a message "certificate" of
 /// almost 16 MiB, with the first part of its content.
 std::string BeginOfEndlessChain() {
   using namespace std::string_literals;
@@ -233,7 +233,7 @@ TEST(ProbeServer, RefusesAnEndlessChain) {
   EXPECT_EQ(Outcome::TOO_LONG, probe.outcome) << probe.failure;
 }
 
-TEST(ProbeServer, KeepsOnlySoManyCertificates) {
+TEST(ProbeServer, KeepsALimitedNumberOfCertificates) {
   const Testing::WorkFolder folder;
   std::string chain = Testing::ReadDataFile("tls/localhost.crt");
   for (int i = 0; i < 99; ++i) {
@@ -273,6 +273,7 @@ TEST(ProbeServer, TriesEachAddressAndUsesTheFirstThatAnswers) {
   EXPECT_EQ(Outcome::ACCEPTED, probe.handshake->outcome);
 }
 
+<<<<<<< HEAD
 /// Accepts TCP connections at 127.0.0.2 and never reads from them.
 class SilentNeighbour {
 public:
@@ -309,6 +310,9 @@ TEST(ProbeServer, UsesTheFirstInOrderWhenSeveralAddressesAnswer) {
 }
 
 TEST(ProbeServer, TriesOnlySoManyAddresses) {
+=======
+TEST(ProbeServer, TriesALimitedNumberOfAddresses) {
+>>>>>>> e9ae3c5c18a2e566fb45543d6ba684165c6b762c
   const Testing::UnusedPort port;
   const System::ScopedNameLookup lookup(
       [](const std::string &) { return System::AddressList(1000, boost::asio::ip::make_address("127.0.0.1")); });
@@ -326,7 +330,7 @@ TEST(ProbeServer, EndsWhenAnAddressDoesNotAnswer) {
   EXPECT_FALSE(probe.handshake);
 }
 
-TEST(ProbeServer, SaysWhyANameHasNoAddress) {
+TEST(ProbeServer, ReportsWhyANameHasNoAddress) {
   const System::ScopedNameLookup lookup(
       [](const std::string &) -> System::AddressList { throw System::NetworkException("Name or service not known"); });
   const ServerProbe probe = ProbeServer("nowhere.example", 443, nullptr, "", PATIENCE);
@@ -346,7 +350,7 @@ TEST(ProbeServer, EndsWhenTheResolverDoesNotAnswer) {
   });
   EXPECT_EQ("the resolver did not answer in time",
             ProbeServer("slow.example", 443, nullptr, "", IMPATIENCE).lookupFailure);
-  begun.get_future().wait(); // a look-up that has not begun would not find this scope
+  begun.get_future().wait(); // a look-up that begins after this scope would not call the function above
   end.set_value();
 }
 

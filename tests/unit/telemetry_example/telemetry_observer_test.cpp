@@ -24,7 +24,7 @@ using nlohmann::json;
 
 const SsoClient::OperationInfo OPERATION = {"0a1b2c3d-0000-4000-8000-00000000000f", "AcquireToken"};
 
-/// Attributes as text by name.
+/// The values of the attributes as text, by name.
 std::map<std::string, std::string> AttributesOf(const json &object) {
   std::map<std::string, std::string> attributes;
   for (const json &attribute : object.at("attributes")) {

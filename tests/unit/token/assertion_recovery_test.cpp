@@ -1,5 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
-// How the parser goes on after deviations: each is reported once, and what follows is still read.
+// How the parser continues after deviations: it reports each once, and still reads what follows.
 #include "unit/token/assertion_refusals.h"
 #include "unit/token/assertion_text.h"
 #include "unit/token/recovered_assertion.h"
@@ -24,12 +24,12 @@ std::string Changed(const std::string &from, const std::string &to) {
   return ReplaceOnce(BearerAssertion(), from, to);
 }
 
-TEST(AssertionRecovery, ReportsNothingOfAnAcceptedAssertion) {
+TEST(AssertionRecovery, ReportsNothingForAnAcceptedAssertion) {
   EXPECT_EQ(Messages{}, RecoveredAssertion(BearerAssertion()).Messages());
   EXPECT_EQ(Messages{}, RecoveredAssertion(HolderOfKeyAssertion()).Messages());
 }
 
-/// What a service of another maker issues by default.
+/// An assertion such as services of other makers issue by default.
 std::string ForeignAssertion() {
   const std::string audience = "<saml:AudienceRestriction><saml:Audience>urn:";
   const std::string end = "</saml:Audience></saml:AudienceRestriction>";
@@ -79,7 +79,7 @@ TEST(AssertionRecovery, ReadsAForeignAssertion) {
   EXPECT_EQ(2u, assertion.AttributeStatement->attributes.size());
 }
 
-TEST(AssertionRecovery, HasThePlacesOfNamesAndAttributes) {
+TEST(AssertionRecovery, RecordsTheElementsOfNamesAndAttributes) {
   const RecoveredAssertion recovered(BearerAssertion());
   const SamlAssertionType &assertion = recovered.record;
   const auto nameOf = [](const Tarvel::Xml::ElementNode *element) { return std::string(element->GetName()); };
@@ -98,7 +98,7 @@ TEST(AssertionRecovery, HasThePlacesOfNamesAndAttributes) {
   EXPECT_EQ("urn:two", attributes[1].element->FindAttribute("", "Name")->GetValue());
 }
 
-TEST(AssertionRecovery, ComparesNamesWithoutTheirPlaces) {
+TEST(AssertionRecovery, ComparesNamesWithoutTheirElements) {
   const ParsedDocument document("<r/>");
   EXPECT_EQ((NameIDType{"f", "v", &document.Root()}), (NameIDType{"f", "v"}));
   EXPECT_NE((NameIDType{"f", "v"}), (NameIDType{"f", "w"}));
@@ -188,13 +188,13 @@ TEST(AssertionRecovery, ReportsTextBeforeTheAttributeStatementOnce) {
   EXPECT_EQ(2u, recovered.record.AttributeStatement->attributes.size());
 }
 
-TEST(AssertionRecovery, HasNoAttributeStatementWhenThereIsOnlyAnother) {
+TEST(AssertionRecovery, HasNoAttributeStatementWhenThereIsOnlyAnotherStatement) {
   const RecoveredAssertion recovered(Changed(Piece::AttributeStatement(), "<saml:AuthzDecisionStatement/>"));
   EXPECT_EQ((Messages{NotFound("AttributeStatement") + " | saml:AuthzDecisionStatement"}), recovered.Messages());
   EXPECT_FALSE(recovered.record.AttributeStatement);
 }
 
-TEST(RecoveredRoot, IsTheAssertionInAnotherDocument) {
+TEST(RecoveredRoot, IsTheFirstAssertionInsideAnotherElement) {
   const RecoveredAssertion recovered("<r><e><Assertion/></e><e>" + BearerAssertion() + "</e>" + HolderOfKeyAssertion() +
                                      "</r>");
   EXPECT_EQ((Messages{NotFound("Assertion") + " | r"}), recovered.Messages());
@@ -203,7 +203,7 @@ TEST(RecoveredRoot, IsTheAssertionInAnotherDocument) {
   EXPECT_TRUE(recovered.record.AttributeStatement);
 }
 
-TEST(RecoveredRoot, IsAnElementOfTheNameInAnotherNamespaceIfThereIsNoAssertion) {
+TEST(RecoveredRoot, IsAnAssertionElementOfAnotherNamespaceIfThereIsNoSamlAssertion) {
   const RecoveredAssertion recovered("<r><e/><Assertion ID='1'/><Assertion/></r>");
   EXPECT_EQ("1", recovered.record.ID);
   EXPECT_EQ(&recovered.document.Child("Assertion"), recovered.record.element);
@@ -215,13 +215,13 @@ TEST(RecoveredRoot, IsAnElementOfTheNameInAnotherNamespaceIfThereIsNoAssertion) 
   EXPECT_EQ("_a1", inner.record.ID);
 }
 
-TEST(RecoveredRoot, IsNotThereInADocumentWithoutAssertions) {
+TEST(RecoveredRoot, IsNullInADocumentWithoutAssertions) {
   const RecoveredAssertion recovered("<r><e><f/></e>text</r>");
   EXPECT_EQ((Messages{NotFound("Assertion") + " | r"}), recovered.Messages());
   EXPECT_FALSE(recovered.record.element);
 }
 
-TEST(RecoveredRoot, IsNotLookedForOutsideOfTheElement) {
+TEST(RecoveredRoot, IsNotSearchedForOutsideTheElement) {
   const ParsedDocument document("<r><e><f/></e>" + BearerAssertion() + "</r>");
   const Tarvel::Xml::ElementNode &e = document.Child("e");
   for (const Tarvel::Xml::Node *const node : {static_cast<const Tarvel::Xml::Node *>(&e), e.GetFirstChild()}) {

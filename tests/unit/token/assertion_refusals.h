@@ -33,7 +33,7 @@ inline void Parse(const std::string &text) {
   SsoClient::ParseSamlAssertionElement(iterator, assertion);
 }
 
-/// The text of the first deviation that a parse reports if it goes on.
+/// The text of the first deviation that a parse reports to a sink that does not throw.
 inline std::string FirstDeviation(const std::string &text) {
   const ParsedDocument document(text);
   SsoClient::NodeFilterIterator iterator = document.Cursor();
@@ -43,8 +43,8 @@ inline std::string FirstDeviation(const std::string &text) {
   return deviations.all.empty() ? std::string() : deviations.all.front().message;
 }
 
-/// Expects that `base` is accepted, and that it is refused after each of the changes, with the first deviation that a report
-/// would list.
+/// Expects that `base` is accepted, and that it is refused after each of the changes. The exception must have the text
+/// of the first deviation that a report would list.
 inline void ExpectRefusals(const std::string &base, const std::vector<Refusal> &refusals) {
   ASSERT_NO_THROW(Parse(base));
   EXPECT_EQ("", FirstDeviation(base));

@@ -1,5 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
-// How the parsers of the elements below an assertion go on after deviations.
+// How the parsers of the elements below an assertion continue after deviations.
 #include "unit/token/assertion_refusals.h"
 #include "unit/token/assertion_text.h"
 #include "unit/token/recovered_assertion.h"
@@ -84,7 +84,7 @@ TEST(SubjectRecovery, ReadsTheFirstOfSeveralConfirmations) {
   EXPECT_FALSE(recovered.record.Subject.SubjectConfirmation.SubjectConfirmationData.certificate);
 }
 
-TEST(SubjectRecovery, ReadsANameWithExtraContentWithoutItsText) {
+TEST(SubjectRecovery, LeavesOutTheTextOfANameWithExtraContent) {
   const RecoveredAssertion recovered = Recover("alice@corp", "alice<b/>");
   EXPECT_EQ((Messages{OnlyText("saml:NameID") + " | saml:NameID"}), recovered.Messages());
   EXPECT_EQ((NameIDType{"urn:format:subject", ""}), recovered.record.Subject.NameID);
@@ -171,7 +171,7 @@ TEST(ConfirmationRecovery, ReadsTheCertificateBetweenOtherElements) {
   EXPECT_TRUE(recovered.record.Subject.SubjectConfirmation.SubjectConfirmationData.certificate);
 }
 
-TEST(ConfirmationRecovery, HasNoCertificateWhenItDoesNotDecode) {
+TEST(ConfirmationRecovery, HasNoCertificateWhenTheTextDoesNotDecode) {
   for (const std::string base64 : {"*", "AAAA"}) {
     const RecoveredAssertion recovered = RecoverHolderOfKey(HolderCertificateBase64(), base64);
     ASSERT_EQ(1u, recovered.deviations.size()) << base64;
@@ -186,7 +186,7 @@ TEST(ConfirmationRecovery, ReportsACertificateWithoutTextOnce) {
   EXPECT_EQ((Messages{OnlyText("ds:X509Certificate") + " | ds:X509Certificate"}), recovered.Messages());
 }
 
-TEST(ConditionsRecovery, ReadsTheOtherDate) {
+TEST(ConditionsRecovery, ReadsTheOtherDateWhenOneIsMissing) {
   const RecoveredAssertion recovered = Recover(" NotBefore=\"2026-01-01T00:00:00Z\"", "");
   EXPECT_EQ((Messages{"Node 'saml:Conditions is missing required attribute 'NotBefore' | saml:Conditions"}),
             recovered.Messages());
@@ -194,7 +194,7 @@ TEST(ConditionsRecovery, ReadsTheOtherDate) {
   EXPECT_EQ(DateTime("2026-01-01T07:00:00Z"), recovered.record.Conditions.NotOnOrAfter);
 }
 
-TEST(ConditionsRecovery, ReportsADateOfAnotherFormOnce) {
+TEST(ConditionsRecovery, ReportsATextThatIsNotADateOnce) {
   const RecoveredAssertion recovered = Recover(" NotBefore=\"2026-01-01T00:00:00Z\"", " NotBefore=\"now\"");
   EXPECT_EQ((Messages{"saml:Conditions/@NotBefore is not a date | saml:Conditions"}), recovered.Messages());
   EXPECT_EQ(DateTime(), recovered.record.Conditions.NotBefore);

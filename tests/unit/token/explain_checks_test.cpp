@@ -1,5 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
-// The checks of a report, each failing alone, several at once, and those that cannot be done.
+// The checks of a report: each fails alone, several fail at once, and some cannot be done.
 
 #include "unit/token/explained_token.h"
 
@@ -34,7 +34,7 @@ TEST_F(ExplainChecks, AllPassForATokenThatIsAccepted) {
   }
 }
 
-TEST_F(ExplainChecks, SayInOneSentenceWhatEachLookedAt) {
+TEST_F(ExplainChecks, StateInOneSentenceWhatEachHasChecked) {
   const std::string thumbprint = TokenCertificates().front()->GetSha256Thumbprint();
   const TokenReport report = Explain(TokenFixture("bearer"));
   const std::vector<std::string> expected{
@@ -122,7 +122,7 @@ TEST_F(ExplainChecks, VersionAndIdAreReportedTogether) {
   EXPECT_EQ("Invalid token version", report.refusal);
 }
 
-TEST_F(ExplainChecks, AnExpiredTokenSaysByHowManySecondsTheClockMisses) {
+TEST_F(ExplainChecks, ReportByHowManySecondsAnExpiredTokenIsLate) {
   const TokenReport report = Explain(TokenFixture("expired"));
   EXPECT_EQ("validity failed", NotPassed(report));
   EXPECT_EQ("The token has expired at: 2021-01-01T00:00:00.000Z", report.refusal);
@@ -138,7 +138,7 @@ TEST_F(ExplainChecks, AnExpiredTokenSaysByHowManySecondsTheClockMisses) {
             finding.remedy);
 }
 
-TEST_F(ExplainChecks, ATokenOfTheFutureSaysByHowManySecondsTheClockMisses) {
+TEST_F(ExplainChecks, ReportByHowManySecondsAFutureTokenIsEarly) {
   const TokenReport report = Explain(SignAgain(ReplaceOnce(
       TokenFixture("bearer"), "NotBefore=\"2020-01-01T00:00:00.000Z\"", "NotBefore=\"2026-01-02T03:14:06.001Z\"")));
   EXPECT_EQ("validity failed", NotPassed(report));

@@ -1,5 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
-// What a report says about a token that nobody has verified.
+// The claims of a report, which the token makes and which are not verified.
 
 #include "unit/token/explained_token.h"
 
@@ -15,7 +15,7 @@ using Tarvel::System::DateTime;
 
 using ExplainClaims = ExplainedTokenTest;
 
-TEST_F(ExplainClaims, AreWhatTheTokenSays) {
+TEST_F(ExplainClaims, AreThoseOfTheToken) {
   const UnverifiedClaims claims = Explain(TokenFixture("full")).claims;
   EXPECT_TRUE(claims.isAssertion);
   EXPECT_EQ("_a18b869b-2e81-c0c5-2955-2a3c4fa5c92e", claims.id.value());
@@ -52,14 +52,14 @@ TEST_F(ExplainClaims, OfABearerTokenHaveNoCertificate) {
   EXPECT_TRUE(claims.groups.empty());
 }
 
-TEST_F(ExplainClaims, AreThereAlsoWhenTheTokenIsRefused) {
+TEST_F(ExplainClaims, AreReportedAlsoWhenTheTokenIsRefused) {
   const std::string token = ReplaceOnce(TokenFixture("bearer"), ">alice@corp.example<", ">mallory@corp.example<");
   const TokenReport report = Explain(token);
   EXPECT_FALSE(report.accepted);
   EXPECT_EQ("mallory", report.claims.subject.value().name);
 }
 
-TEST_F(ExplainClaims, AreWhatCanBeReadOfAnotherForm) {
+TEST_F(ExplainClaims, AreThoseThatCanBeReadInATokenOfAnotherForm) {
   std::string token =
       ReplaceOnce(TokenFixture("bearer"), "saml:NameID Format=\"http://schemas.xmlsoap.org/claims/UPN\"",
                   "saml:NameID Format=\"urn:oasis:names:tc:SAML:2.0:nameid-format:persistent\"");
@@ -83,14 +83,14 @@ TEST_F(ExplainClaims, AreEmptyForAnEmptyAssertion) {
   EXPECT_FALSE(claims.renewable || claims.delegable || claims.solution || claims.fullName);
 }
 
-TEST_F(ExplainClaims, AreTextsAsTheSenderWroteThem) {
+TEST_F(ExplainClaims, KeepTheTextsAsTheSenderWroteThem) {
   const std::string hostile = "al\u202eice\u0085";
   const TokenReport report = Explain(ReplaceOnce(TokenFixture("bearer"), ">alice@corp.example<", ">" + hostile + "<"));
   EXPECT_EQ(hostile, report.claims.nameId.value());
   EXPECT_EQ("al\\u202Eice\\u0085", report.Get(TokenReport::Check::NAMES).findings.at(0).found);
 }
 
-TEST_F(ExplainClaims, DoNotHideOtherChecksWhenThereAreThousandsOfDeviations) {
+TEST_F(ExplainClaims, ThousandsOfDeviationsDoNotHideOtherChecks) {
   std::string elements;
   for (int index = 0; index < 5000; ++index) {
     elements += "<x/>";

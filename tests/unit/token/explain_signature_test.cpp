@@ -1,5 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
-// What a report says about the signature: algorithms, keys, references, value and digests.
+// The report on the signature of a token: algorithms, keys, references, value and digests.
 
 #include "unit/token/explained_token.h"
 
@@ -75,7 +75,7 @@ TEST_F(ExplainSignatureTest, FindsTheSecondTrustedKeyWithoutKeyInfo) {
   EXPECT_TRUE(report.trustedKeys.at(1).madeSignature);
 }
 
-TEST_F(ExplainSignatureTest, AStrangersCertificateIsNamedButNotUsed) {
+TEST_F(ExplainSignatureTest, AnUntrustedCertificateIsNamedButNotUsed) {
   const TokenReport report = ExplainWith(TokenCertificates({"other"}), TokenFixture("bearer"));
   const std::string stranger = "CN=sts,O=Example (SHA-256 " + ThumbprintOf("sts-rsa") + ")";
   EXPECT_EQ("signature failed", NotPassed(report));
@@ -96,7 +96,7 @@ TEST_F(ExplainSignatureTest, AStrangersCertificateIsNamedButNotUsed) {
       finding.remedy);
 }
 
-TEST_F(ExplainSignatureTest, WithoutKeyInfoTheCertificateIsAskedFor) {
+TEST_F(ExplainSignatureTest, AsksForTheCertificateWithoutKeyInfo) {
   const TokenReport report = ExplainWith(TokenCertificates({"other"}), SignAgain(TokenFixture("bearer")));
   EXPECT_EQ(
       "Give the certificate of the service that issued the token. If it is given already, the token was changed: use "
@@ -117,7 +117,7 @@ TEST_F(ExplainSignatureTest, ASignatureThatOnlyClaimsATrustedCertificateMayBeFor
             OnlyFinding(report, Check::SIGNATURE).remedy);
 }
 
-TEST_F(ExplainSignatureTest, WithoutATrustedKeyTheCertificateIsAskedFor) {
+TEST_F(ExplainSignatureTest, AsksForTheCertificateWithoutATrustedKey) {
   const TokenReport report = ExplainWith({}, TokenFixture("bearer"));
   EXPECT_EQ("keys failed, signature not done", NotPassed(report));
   EXPECT_EQ("Signature verification error. No trusted key can be used with the signature algorithm "
@@ -131,7 +131,7 @@ TEST_F(ExplainSignatureTest, WithoutATrustedKeyTheCertificateIsAskedFor) {
   EXPECT_TRUE(report.trustedKeys.empty());
 }
 
-TEST_F(ExplainSignatureTest, AKeyThatDoesNotFitTheAlgorithmCannotBeUsed) {
+TEST_F(ExplainSignatureTest, AKeyThatDoesNotMatchTheAlgorithmCannotBeUsed) {
   const TokenReport report = ExplainWith(TokenCertificates({"sts-ec256"}), SignAgain(TokenFixture("bearer")));
   EXPECT_EQ("keys failed, signature not done", NotPassed(report));
   EXPECT_EQ("0 of 1 trusted keys can be used with the signature.", report.Get(Check::KEYS).summary);
@@ -211,7 +211,7 @@ TEST_F(ExplainSignatureTest, OnlyAReferenceToTheAssertionOrTheDocumentCoversTheT
   EXPECT_TRUE(report.references[1].coversToken);
 }
 
-TEST_F(ExplainSignatureTest, WithoutASignatureNothingAboutItIsDone) {
+TEST_F(ExplainSignatureTest, DoesNoCheckOfAMissingSignature) {
   const TokenReport report = Explain(Attack("unsigned"));
   EXPECT_EQ(
       "form failed, algorithms not done, keys not done, references not done, signature not done, digests not done",

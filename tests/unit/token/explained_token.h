@@ -39,7 +39,7 @@ inline std::string NotPassed(const SsoClient::TokenReport &report) {
   return text;
 }
 
-/// The only finding of `check`; fails and returns an empty one if there is another number.
+/// The only finding of `check`. If there is none or more than one, the test fails, and the result is empty.
 inline SsoClient::TokenReport::Finding OnlyFinding(const SsoClient::TokenReport &report,
                                                    SsoClient::TokenReport::Check check) {
   const auto &findings = report.Get(check).findings;

@@ -15,7 +15,7 @@ namespace {
 using namespace SsoClient;
 using Testing::ReadDataFile;
 
-/// The code spans with which the rows of the table after `head` begin.
+/// The code spans at the beginning of the rows of the table after `head`.
 std::vector<std::string> ReadRowNames(const std::string &page, const std::string &head) {
   std::vector<std::string> names;
   const std::string rowBegin = "\n| `";

@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
-// A document of a million deviations: the parser examines each node a limited number of times, and makes only the texts for
-// which the sink has space. RecordedDeviations checks the latter. A parser that takes quadratic time would need hours.
+// Documents with a million deviations. The parser examines each node a limited number of times; otherwise these tests
+// would need hours. It makes texts only as long as the sink is not full, which RecordedDeviations checks.
 #include "support/parsed_document.h"
 #include "support/recorded_deviations.h"
 #include "token/assertion_parser.h"
@@ -69,7 +69,7 @@ TEST(HostileAssertion, HasAMillionElementsInLists) {
 }
 
 TEST(HostileAssertion, HasManyStatements) {
-  const std::size_t half = MANY / 2; // more would not be in the reader's limits
+  const std::size_t half = MANY / 2; // more would exceed the reader's limits
   EXPECT_EQ(half, CountDeviations(Piece::AttributeStatement(), Many("<saml:AttributeStatement/>", half + 1)));
   const std::size_t pairs = MANY / 8;
   const std::string statement = "<saml:AttributeStatement><saml:Attribute Name=\"\"/></saml:AttributeStatement>";
@@ -77,20 +77,20 @@ TEST(HostileAssertion, HasManyStatements) {
 }
 
 TEST(HostileAssertion, HasAMillionElementsInsteadOfItsOwn) {
-  // Issuer, Signature, Subject, Conditions and AuthnStatement are each looked for in the whole list. Each element is then
-  // refused, because it is not an attribute statement.
+  // The parser searches the whole list for each of Issuer, Signature, Subject, Conditions and AuthnStatement. Then it
+  // refuses each element, because none is an attribute statement.
   const std::string content = BearerAssertion();
   const std::size_t begin = content.find("<saml:Issuer");
   const std::string children = content.substr(begin, content.find("</saml:Assertion>") - begin);
   EXPECT_EQ(MANY + 5, CountDeviations(children, Many("<x/>")));
 }
 
-TEST(HostileAssertion, HasManyDatesOfAnotherForm) {
+TEST(HostileAssertion, HasManyTextsThatAreNotDates) {
   const std::size_t dates = MANY / 4;
   EXPECT_EQ(2 * dates, CountDeviations(Piece::DELEGATES, Many("<del:Delegate DelegationInstant=\"\"/>", dates)));
 }
 
-TEST(HostileAssertion, HasItsNameInDeepElements) {
+TEST(HostileAssertion, IsFoundBelowManyElementsOfItsName) {
   std::string text = BearerAssertion();
   for (int depth = 0; depth < 200; ++depth) {
     text = "<Assertion>" + text + "</Assertion>";

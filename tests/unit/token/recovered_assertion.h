@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// `RecoveredAssertion`, what a parse that goes on after deviations reports and reads.
+/// `RecoveredAssertion`, what a parse that continues after deviations reports and reads.
 
 #pragma once
 
@@ -13,7 +13,7 @@
 
 namespace Testing {
 
-/// A document, and what a parse read of it. The first deviation is compared with the exception of a verification.
+/// A document, and what a parse read in it. The first deviation is compared with the exception of a verification.
 struct RecoveredAssertion {
   explicit RecoveredAssertion(const std::string &text) : document(text) {
     deviations = DeviationsOf([&](SsoClient::DeviationSink &sink) {
@@ -27,7 +27,7 @@ struct RecoveredAssertion {
     });
   }
 
-  /// "message | element" of each deviation; the other fields are those of the rules, which have tests of their own.
+  /// "message | element" of each deviation. The tests of the rules check the other fields.
   std::vector<std::string> Messages() const {
     std::vector<std::string> messages;
     for (const ExpectedDeviation &deviation : deviations) {

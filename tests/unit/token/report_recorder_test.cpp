@@ -18,14 +18,14 @@ Deviation Saying(const std::string &message) {
   return {message, nullptr, {}, {}, {}, 0};
 }
 
-/// Adds `count` deviations as a rule does, which makes no text for a full sink.
+/// Adds `count` deviations like a rule, which makes no text for a full sink.
 void Fill(ReportRecorder &recorder, std::size_t count) {
   for (std::size_t index = 0; index < count; ++index) {
     ReportDeviation(recorder, [] { return Saying("again"); });
   }
 }
 
-TEST(ReportRecorder, GivesTheReportAllChecksNotDone) {
+TEST(ReportRecorder, BeginsTheReportWithAllChecksNotDone) {
   TokenReport report;
   const ReportRecorder recorder(report);
   ASSERT_EQ(14u, report.checks.size());
@@ -55,7 +55,7 @@ TEST(ReportRecorder, RecordsADeviationWithItsPlace) {
   EXPECT_EQ(Outcome::FAILED, report.Get(Check::FORM).outcome);
 }
 
-TEST(ReportRecorder, MakesAllTextsButTheRefusalPrintable) {
+TEST(ReportRecorder, MakesAllTextsExceptTheRefusalPrintable) {
   const std::string hostile = "a\x1b[31m\n\u202e\u0085z";
   const std::string shown = "a\\u001B[31m\\u000A\\u202E\\u0085z";
   TokenReport report;
@@ -84,7 +84,7 @@ TEST(ReportRecorder, MakesNamesOfElementsPrintable) {
   EXPECT_EQ("/a\\u061C/b\\u061C", report.Get(Check::FORM).findings.front().path);
 }
 
-TEST(ReportRecorder, CutsAllTextsButTheRefusal) {
+TEST(ReportRecorder, CutsAllTextsExceptTheRefusal) {
   const std::string text(2000, 'x');
   const std::string cut = std::string(1024, 'x') + "... (976 more bytes)";
   TokenReport report;
@@ -101,7 +101,7 @@ TEST(ReportRecorder, CutsAllTextsButTheRefusal) {
   EXPECT_EQ(cut, report.Get(Check::FORM).summary);
 }
 
-TEST(ReportRecorder, ListsAThousandFindingsAtMostAndOneOfEachCheck) {
+TEST(ReportRecorder, ListsAtMostAThousandFindingsAndAtLeastOneOfEachCheck) {
   TokenReport report;
   ReportRecorder recorder(report);
   std::size_t listed = 0;

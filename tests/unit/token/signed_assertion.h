@@ -16,10 +16,10 @@ struct SigningChoices {
   std::string key = "sts-rsa"; ///< the name of the key file under tests/data/tokens
   std::string reference;       ///< the URI of the reference; "#" and the ID of the assertion if it is empty
   std::string keyInfo;         ///< the `ds:KeyInfo` element; may be empty
-  std::string digest;          ///< the digest in Base64; the right one if it is empty
+  std::string digest;          ///< the digest in Base64; the correct one if it is empty
 };
 
-/// `token`, whose signature is after the issuer, with a new signature in its place.
+/// `token` with a new signature in place of its own. @throws std::logic_error  it has no signature
 std::string SignAgain(const std::string &token, const SigningChoices &choices = {});
 
 /// The file tests/data/tokens/NAME.xml.

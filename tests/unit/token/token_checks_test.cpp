@@ -289,7 +289,7 @@ TEST_F(CheckTokenPropertiesTest, ReadsTheClockOnlyAfterItHasCheckedVersionIdAndO
   EXPECT_EQ(0, looks);
 }
 
-TEST_F(CheckTokenPropertiesTest, ReportsEveryRuleThatFailsToASinkThatGoesOn) {
+TEST_F(CheckTokenPropertiesTest, ReportsEveryFailedRuleToASinkThatDoesNotThrow) {
   SamlAssertionType assertion = WithDelegation(ValidBetween(3601, -3601), BACKUP, {});
   assertion.Subject.SubjectConfirmation.Method = SamlToken::BEARER;
   assertion.Subject.SubjectConfirmation.SubjectConfirmationData.NotOnOrAfter = AtSecond(-3602);
@@ -319,8 +319,8 @@ std::int64_t MissedBySec(const ConditionsType &conditions, std::int64_t clockTol
   return sink.all.empty() ? 0 : sink.all.back().missedBySec;
 }
 
-// The smallest number of whole seconds after which the token would be accepted if the clock were set by so much.
-TEST_F(CheckTokenPropertiesTest, ReportsBySecondsHowFarTheClockIsFromTheToleratedValidity) {
+// The token would be accepted if the clock were changed by this many seconds: the smallest whole number.
+TEST_F(CheckTokenPropertiesTest, ReportsByHowManySecondsTheClockMissesTheToleratedValidity) {
   const auto missed = [](std::int64_t from, std::int64_t to) {
     return MissedBySec(ValidBetween(from, to).Conditions, TOLERANCE_SEC);
   };

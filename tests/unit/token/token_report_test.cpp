@@ -49,7 +49,7 @@ TEST(TokenReport, GetsACheckAndTheFirstFailedOne) {
   EXPECT_EQ(nullptr, TokenReport().FirstFailed());
 }
 
-TEST(TokenReport, HasNoOtherChecks) {
+TEST(TokenReport, ThrowsForACheckThatItDoesNotHave) {
   EXPECT_THROWS_MESSAGE(WithOneFinding().Get(Check::FORM), Tarvel::InvalidArgumentException,
                         "Invalid argument : the report has no check of number 1");
 }

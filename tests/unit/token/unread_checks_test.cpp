@@ -19,7 +19,7 @@ std::string Changed(const std::string &from, const std::string &to, const std::s
   return SignAgain(ReplaceOnce(TokenFixture(fixture), from, to));
 }
 
-/// The text without what is between `begin` and `end`, and without these two.
+/// The text without the part from `begin` to `end`, which are removed, too.
 std::string Without(std::string text, const std::string &begin, const std::string &end) {
   const std::size_t position = text.find(begin);
   return text.erase(position, text.find(end, position + begin.size()) + end.size() - position);
@@ -27,7 +27,7 @@ std::string Without(std::string text, const std::string &begin, const std::strin
 
 using UnreadChecks = ExplainedTokenTest;
 
-TEST_F(UnreadChecks, WithoutConditionsNothingThatNeedsThemIsDone) {
+TEST_F(UnreadChecks, ChecksThatNeedTheConditionsAreNotDoneWithoutThem) {
   const TokenReport report =
       Explain(SignAgain(Without(TokenFixture("bearer"), "<saml:Conditions", "</saml:Conditions>")));
   EXPECT_EQ("form failed, validity not done, confirmation not done, delegation not done, audience not done",
@@ -70,7 +70,7 @@ TEST_F(UnreadChecks, AnUnknownConfirmationIsNotCompared) {
   EXPECT_EQ("urn:oasis:names:tc:SAML:2.0:cm:sender-vouches", report.claims.confirmationMethod.value());
 }
 
-TEST_F(UnreadChecks, AnIdThatIsMissingIsReportedOnce) {
+TEST_F(UnreadChecks, AMissingVersionIsReportedOnce) {
   const TokenReport version = Explain(Changed(" Version=\"2.0\"", ""));
   EXPECT_EQ("form failed, identifiers not done", NotPassed(version));
   EXPECT_EQ("The Version is missing.", version.Get(Check::IDENTIFIERS).summary);
@@ -93,7 +93,7 @@ TEST_F(UnreadChecks, ADelegateThatCannotBeReadIsReportedOnce) {
   EXPECT_EQ("backup@corp.example", ReplaceOnce(delegate, "</saml:NameID></del:Delegate>", ""));
 }
 
-TEST_F(UnreadChecks, AnIdThatIsMissingIsNotReportedAgainAsAnId) {
+TEST_F(UnreadChecks, AMissingIdIsNotReportedAgainAsAWrongId) {
   const TokenReport report = Explain(Without(TokenFixture("bearer"), " ID=\"", "\""));
   EXPECT_EQ(Outcome::NOT_DONE, report.Get(Check::IDENTIFIERS).outcome);
   EXPECT_EQ("The ID is missing.", report.Get(Check::IDENTIFIERS).summary);
@@ -107,7 +107,7 @@ TEST_F(UnreadChecks, ADelegateOfTheConfirmationThatCannotBeReadIsNotCompared) {
   EXPECT_EQ("The delegate of the SubjectConfirmation cannot be read.", report.Get(Check::DELEGATION).summary);
 }
 
-TEST_F(UnreadChecks, WithoutASubjectConfirmationNothingIsComparedWithIt) {
+TEST_F(UnreadChecks, AMissingSubjectConfirmationIsNotCompared) {
   const TokenReport report = Explain(
       SignAgain(Without(TokenFixture("delegated"), "<saml:SubjectConfirmation ", "</saml:SubjectConfirmation>")));
   EXPECT_EQ("form failed, confirmation not done, delegation not done, required-confirmation not done",
@@ -115,12 +115,12 @@ TEST_F(UnreadChecks, WithoutASubjectConfirmationNothingIsComparedWithIt) {
   EXPECT_EQ("There is no SubjectConfirmation.", report.Get(Check::DELEGATION).summary);
 }
 
-TEST_F(UnreadChecks, WithoutReferencesNoneResolves) {
+TEST_F(UnreadChecks, ReferencesAreNotCheckedIfThereAreNone) {
   const TokenReport report = Explain(ReadDataFile("attacks/references-none.xml"));
   EXPECT_EQ(Outcome::NOT_DONE, report.Get(Check::REFERENCES).outcome) << WriteTokenReport(report);
 }
 
-TEST(ReportClock, IsTheOneWithWhichTheValidityWasCompared) {
+TEST(ReportClock, HasTheTimeThatTheValidityWasComparedWith) {
   std::int64_t now = Tarvel::System::DateTime("2026-01-02T03:04:05Z").GetUtcTime();
   const Tarvel::ScopedEnvironment clock({[&now] { return now += 1'000'000; }, {}});
   const TokenReport report = TokenVerifier(TokenCertificates()).Explain(TokenFixture("expired"));

@@ -26,7 +26,7 @@ DoctorCheck Check(const std::vector<CertificateFile> &files, const DateTime &now
   return CheckCertificates(files, ServerProbe(), now);
 }
 
-/// A probe of a server whose chain ends in the first certificate of the file; in none for an empty name.
+/// A probe of a server whose chain ends in the first certificate of the file, or in no trusted one for an empty name.
 ServerProbe ProbeWithAnchor(const std::string &name) {
   ServerProbe probe;
   probe.handshake = HandshakeProbe();
@@ -37,14 +37,14 @@ ServerProbe ProbeWithAnchor(const std::string &name) {
   return probe;
 }
 
-TEST(CheckCertificates, ListsThem) {
+TEST(CheckCertificates, ListsTheCertificates) {
   EXPECT_EQ("certificates  fine      2 certificates.\n"
             "                        CN=localhost of sts.pem: EC, P-256; 34331 days left.\n"
             "                        CN=authority of ca.pem: EC, P-256; 34331 days left.\n",
             TextOf(Check({Trust("tls/localhost"), Authority("tls/authority")})));
 }
 
-TEST(CheckCertificates, IsNotDoneWithoutAny) {
+TEST(CheckCertificates, IsNotDoneWithoutCertificates) {
   EXPECT_EQ("certificates  not done  Neither --trust nor --ca is given.\n", TextOf(Check({})));
 }
 
@@ -102,7 +102,7 @@ TEST(CheckCertificates, DoesNotApplyTheRulesOfTokensToAnAuthority) {
             Check({Authority("crypto/rsa1024")}, CertificatesOf("crypto/rsa1024").front()->GetNotBefore()).outcome);
 }
 
-TEST(CheckCertificates, SaysWhetherTheServersChainEndsInTheAuthorities) {
+TEST(CheckCertificates, ReportsWhetherTheServersChainEndsInTheAuthorities) {
   const auto foundWith = [](const ServerProbe &probe) {
     return CheckCertificates({Authority("tls/authority")}, probe, NOON);
   };

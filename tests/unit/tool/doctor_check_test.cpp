@@ -84,7 +84,7 @@ TEST(RenderChecksJson, HasFindingsAndAdviceAsTextsAndTheFactsAsFurtherKeys) {
             RenderChecksJson({FailedCheck(), FineCheck()}));
 }
 
-TEST(RenderChecksJson, IsValidWhateverOctetsAServerSends) {
+TEST(RenderChecksJson, IsValidForAllOctetsThatAServerSends) {
   DoctorCheck check("http");
   check.found = {"\xff\x80"};
   EXPECT_EQ("\xEF\xBF\xBD\xEF\xBF\xBD", JsonOf(check).at("found").get<std::string>());

@@ -27,7 +27,7 @@ std::string HttpText(const DoctorExchange &exchange) {
   return TextOf(CheckHttp(&exchange, ""));
 }
 
-/// The check of the clocks when the answer came so many seconds after, or before, the service's noon.
+/// The check of the clocks if the answer arrived this many seconds after the service's noon, or before it if negative.
 DoctorCheck ClockOf(std::int64_t seconds, std::int64_t durationMicroseconds = 0) {
   DoctorExchange exchange = Answered(200, "OK");
   exchange.date = DATE;
@@ -95,7 +95,7 @@ TEST(CheckHttp, ExplainsTheStatus) {
   }
 }
 
-TEST(CheckHttp, TellsASilentServerFromOneThatSpeaksAnotherProtocol) {
+TEST(CheckHttp, DistinguishesASilentServerFromOneWithAnotherProtocol) {
   DoctorExchange exchange;
   exchange.failure = "no answer";
   EXPECT_EQ("http          failed    No answer.\n"
@@ -160,7 +160,7 @@ TEST(CheckClock, IsNotDoneWithoutADate) {
   EXPECT_EQ("clock         not done  There is no answer with a date.\n", TextOf(CheckClock(&exchange)));
 }
 
-/// What an exchange with a server of plain HTTP that answers `bytes` comes to.
+/// The result of an exchange with a plain HTTP server that answers with `bytes`.
 DoctorExchange ExchangeWith(const std::string &bytes) {
   Testing::ScriptedServer server([&bytes](Testing::ServerConnection &peer) {
     peer.ReadRequest();

@@ -88,7 +88,7 @@ TEST(CheckTcp, FailsWhenNoAddressAnswers) {
   EXPECT_EQ(ExitCode::COMMUNICATION, check.exitCode);
 }
 
-TEST(CheckTcp, SaysWhatToDoAboutEachKindOfFailure) {
+TEST(CheckTcp, ShowsWhatToDoAboutEachKindOfFailure) {
   EXPECT_EQ(
       std::vector<std::string>{"A firewall may drop the packets, or no machine has the address. Open the port, or "
                                "correct --sts."},

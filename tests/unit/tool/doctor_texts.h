@@ -15,7 +15,7 @@
 
 namespace SsoClient::Tool {
 
-/// Years after the start, and before the end, of most certificates of tests/data.
+/// A time at which most certificates of tests/data are valid, years after their start and before their end.
 inline const Tarvel::System::DateTime NOON("2026-01-02T12:00:00Z");
 
 /// The check as the tool shows it on a very wide terminal.

@@ -64,7 +64,7 @@ std::string ThumbprintOf(const std::string &certificate) {
   return CertificatesOf("tls/" + certificate).front()->GetSha256Thumbprint();
 }
 
-TEST(CheckTls, ShowsWhatWasAgreedOnTheThumbprintAndTheChain) {
+TEST(CheckTls, ShowsVersionCipherThumbprintAndChain) {
   EXPECT_EQ("tls           fine      TLSv1.3 with TLS_AES_256_GCM_SHA384; the server is accepted (4 ms).\n"
             "                        SHA-256 thumbprint of its certificate: " +
                 ThumbprintOf("localhost") +
@@ -122,7 +122,7 @@ TEST(CheckTls, GivesTheSameAdviceOnlyOnceAndCutsTheListOfReasons) {
   EXPECT_EQ("And 89 more reasons.", check.found[11]);
 }
 
-TEST(CheckTls, SaysThatAnotherMachineMayAnswerWhenTheThumbprintDiffers) {
+TEST(CheckTls, WarnsThatAnotherMachineMayAnswerIfTheThumbprintDiffers) {
   HandshakeProbe handshake = Refused("localhost", {Kind::OTHER_THUMBPRINT});
   handshake.refusals[0].certificate = nullptr;
   const DoctorCheck check = Check(handshake, true);

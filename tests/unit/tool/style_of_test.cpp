@@ -125,7 +125,7 @@ TEST_F(StyleOfDescriptor, HasTheDefaultWidthWhenItIsNotKnown) {
   EXPECT_EQ(100u, StyleOf(m_file.Get()).width);
 }
 
-TEST_F(StyleOfDescriptor, HasTheWidthOfColumnsFirst) {
+TEST_F(StyleOfDescriptor, PrefersTheWidthInTheVariableColumns) {
   const ScopedVariable columns("COLUMNS", "77");
   EXPECT_EQ(77u, StyleOf(m_terminal.Get()).width);
   EXPECT_EQ(77u, StyleOf(m_file.Get()).width);

@@ -48,7 +48,7 @@ TEST(Wrap, CountsCharactersAndSplitsNone) {
   EXPECT_THAT(Wrap("\xF0\x9F\x99\x82 \xF0\x9F\x99\x82", 1), ElementsAre("\xF0\x9F\x99\x82", "\xF0\x9F\x99\x82"));
 }
 
-TEST(Wrap, EndsForTextThatIsNotUtf8AndForBlanksAlone) {
+TEST(Wrap, EndsForTextThatIsNotUtf8AndForOnlyBlanks) {
   EXPECT_EQ(1u, Wrap(std::string(5000, '\x80'), 10).size());
   for (const std::string &line : Wrap(std::string(50, ' '), 10)) {
     EXPECT_LE(line.size(), 10u);
@@ -95,7 +95,7 @@ TEST(Table, HasNoLineBeyondTheWidth) {
   }
 }
 
-TEST(Table, GivesAColumnWhatTheOtherOneDoesNotNeed) {
+TEST(Table, GivesAColumnTheWidthThatTheOtherDoesNotNeed) {
   Table table({"A", "B", "C", "D"});
   table.Add({Cell{"a"}, Cell{"b"}, Cell{"c"}, Cell{std::string(60, 'd')}});
   EXPECT_EQ("A  B  C  D\na  b  c  " + std::string(51, 'd') + "\n         " + std::string(9, 'd') + "\n",

@@ -52,11 +52,11 @@ TEST(ChooseStyle, ColoursNothingOnADumbTerminal) {
   EXPECT_TRUE(ChooseStyle(facts).hasColours);
 }
 
-TEST(ChooseStyle, TakesTheWidthOfTheTerminal) {
+TEST(ChooseStyle, HasTheWidthOfTheTerminal) {
   EXPECT_EQ(132u, ChooseStyle(Terminal()).width);
 }
 
-TEST(ChooseStyle, TakesTheWidthOfColumnsFirst) {
+TEST(ChooseStyle, PrefersTheWidthInTheVariableColumns) {
   TerminalFacts facts = Terminal();
   facts.columnsVariable = "80";
   EXPECT_EQ(80u, ChooseStyle(facts).width);
@@ -64,7 +64,7 @@ TEST(ChooseStyle, TakesTheWidthOfColumnsFirst) {
   EXPECT_EQ(80u, ChooseStyle(facts).width);
 }
 
-TEST(ChooseStyle, IgnoresColumnsThatAreNoNumberGreaterThanZero) {
+TEST(ChooseStyle, IgnoresColumnsThatAreNotAPositiveNumber) {
   for (const char *value : {"", "0", "-80", "+80", " 80", "80x", "0x50", "many"}) {
     TerminalFacts facts = Terminal();
     facts.columnsVariable = value;
@@ -102,7 +102,7 @@ TEST(Coloured, EndsTheColourAfterTheText) {
   EXPECT_EQ("\033[1mname\033[0m", Coloured("name", Colour::BOLD, true));
 }
 
-TEST(Coloured, LeavesTextWithoutColourAndEmptyTextAlone) {
+TEST(Coloured, DoesNotChangeTextWithoutColourOrEmptyText) {
   EXPECT_EQ("text", Coloured("text", Colour::NONE, true));
   EXPECT_EQ("", Coloured("", Colour::RED, true));
   EXPECT_EQ("text", Coloured("text", Colour::RED, false));

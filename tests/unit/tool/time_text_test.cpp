@@ -51,7 +51,7 @@ INSTANTIATE_TEST_SUITE_P(Each, SpanTextOf, testing::ValuesIn(SPANS), [](const au
   return "Number" + std::to_string(span.index) + "Of" + std::to_string(std::size(SPANS));
 });
 
-TEST(WhenText, SaysInOrAgo) {
+TEST(WhenText, HasInOrAgo) {
   const DateTime now("2026-01-01T12:00:00Z");
   EXPECT_EQ("in 7 h 12 min", WhenText(DateTime("2026-01-01T19:12:00Z"), now));
   EXPECT_EQ("3 d 4 h ago", WhenText(DateTime("2025-12-29T08:00:00Z"), now));

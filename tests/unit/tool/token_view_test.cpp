@@ -52,7 +52,7 @@ void Fail(TokenReport &report, Check check, const std::string &message) {
   }
 }
 
-/// A report as of a token of another maker's service.
+/// A report such as that on a token from another maker's service.
 TokenReport Foreign() {
   TokenReport report = Passed();
   Fail(report, Check::FORM, "Unexpected attribute: 'Id'");
@@ -106,7 +106,7 @@ TEST(TokenJson, HasNullForWhatIsNotKnown) {
   }
 }
 
-TEST(TokenJson, OfARefusedTokenSaysNothingThatTheTokenSays) {
+TEST(TokenJson, OfARefusedTokenHasNothingThatTheTokenStates) {
   TokenView view;
   view.report = ReportView{Foreign()};
   const ordered_json json = ordered_json::parse(TokenJson(view));
@@ -194,7 +194,7 @@ TEST(ReportJson, WithoutTrustHasTheRefusalThatNeedsNoTrust) {
   EXPECT_EQ("No form, exactly", ReportJson(WithoutTrust(report))["refusal"]);
 }
 
-TEST(TokenJson, IsAsciiWhateverTheTokenSays) {
+TEST(TokenJson, IsAsciiEvenIfTheTokenIsNot) {
   TokenFacts facts;
   facts.id = "\xC3\xA9\xE2\x80\xAE\x1B";
   TokenReport report = Foreign();
@@ -210,7 +210,7 @@ TEST(TokenJson, IsAsciiWhateverTheTokenSays) {
 
 const TextStyle PLAIN{100, false};
 
-TEST(TokenText, SaysUnknownForWhatIsNotKnown) {
+TEST(TokenText, ShowsUnknownForWhatIsNotKnown) {
   EXPECT_THAT(TokenText(ViewWith({}, Foreign()), PLAIN),
               testing::StartsWith(R"(Verified:        no, nothing below was checked
 Id:              unknown
@@ -234,7 +234,7 @@ TEST(TokenText, ShowsHowFarTimesAreAway) {
   EXPECT_THAT(text, HasSubstr("\nNot on or after: 2026-01-01T19:12:00.000Z (in 7 h 12 min)\n"));
 }
 
-TEST(TokenText, WithoutTrustListsWhatDeviatesAndSaysWhatWasNotChecked) {
+TEST(TokenText, WithoutTrustListsWhatDeviatesAndWhatWasNotChecked) {
   TokenReport report = Foreign();
   report.claims.nameId = "alice";
   EXPECT_THAT(TokenText(ViewWith({}, report), PLAIN), EndsWith(R"(
@@ -258,7 +258,7 @@ TEST(TokenText, WithoutTrustHasNoTableIfNothingDeviates) {
                              "given.\n"));
 }
 
-TEST(TokenText, OfARefusedTokenSaysNothingThatTheTokenSays) {
+TEST(TokenText, OfARefusedTokenHasNothingThatTheTokenStates) {
   TokenView view;
   view.report = ReportView{Foreign()};
   const std::string text = TokenText(view, PLAIN);
@@ -274,7 +274,7 @@ TEST(ReportText, ListsEachCheckWithItsOutcome) {
   EXPECT_EQ(1 + 14 + 5 + 1, std::count(text.begin(), text.end(), '\n')); // headings, checks, two findings
 }
 
-TEST(ReportText, SaysByHowMuchAClockMissesAndHowManyFindingsAreLeftOut) {
+TEST(ReportText, ShowsByHowMuchAClockMissesAndHowManyFindingsAreLeftOut) {
   TokenReport report = Passed();
   Fail(report, Check::VALIDITY, "The token has expired");
   ResultOf(report, Check::VALIDITY).findings.front().missedBySec = 3660;
@@ -284,7 +284,7 @@ TEST(ReportText, SaysByHowMuchAClockMissesAndHowManyFindingsAreLeftOut) {
                                                      "                                and 2 more findings\n"));
 }
 
-TEST(ReportText, SaysOnceWhatToDoAboutSeveralFindings) {
+TEST(ReportText, ShowsOnceWhatToDoAboutSeveralFindings) {
   TokenReport report = Passed();
   for (const char *message : {"One", "Two", "Three"}) {
     Fail(report, Check::FORM, message);

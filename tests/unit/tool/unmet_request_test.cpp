@@ -79,7 +79,7 @@ TEST(FindUnmet, ListsNothingWhenNothingIsMissing) {
   EXPECT_THAT(FindUnmet(SpecWithEverything(), ASKED_AT, facts, 0), IsEmpty());
 }
 
-TEST(FindUnmet, ListsWhatTheTokenDoesNotSay) {
+TEST(FindUnmet, ListsWhatTheTokenDoesNotState) {
   TokenSpec spec = SpecFor(60);
   spec.renewable = true;
   EXPECT_THAT(WantedOf(spec, TokenFacts()),

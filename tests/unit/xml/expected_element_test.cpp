@@ -22,11 +22,11 @@ std::string NameAt(const NodeFilterIterator &iterator) {
   return element ? std::string(element->GetName()) : iterator.node ? "another node" : "the end";
 }
 
-/// What taking an element `x:e` did.
+/// The result of taking an element `x:e`.
 struct Taken {
-  std::string element;              ///< that was taken
+  std::string element;              ///< the name of the element that was taken
   std::string next;                 ///< where the cursor is afterwards
-  std::vector<std::string> refused; ///< the nodes that were refused: what was found there
+  std::vector<std::string> refused; ///< what was found at each node that was refused
 
   friend bool operator==(const Taken &, const Taken &) = default;
   friend std::ostream &operator<<(std::ostream &out, const Taken &taken) {

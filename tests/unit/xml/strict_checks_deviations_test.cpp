@@ -1,5 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
-// What the strict checks report to a sink that goes on. DeviationsOf compares the first deviation with the exception.
+// What the strict checks report to a sink that does not throw. DeviationsOf compares the first one with the exception.
 #include "xml/strict_checks.h"
 
 #include "support/parsed_document.h"
@@ -22,7 +22,7 @@ using Deviations = std::vector<ExpectedDeviation>;
 
 constexpr const char *START = "<a:r xmlns:a='urn:a' xmlns:saml='urn:oasis:names:tc:SAML:2.0:assertion'>";
 
-TEST(RequireElementQNameOfCursor, IsSilentWhenTheElementIsThere) {
+TEST(RequireElementQNameOfCursor, ReportsNothingWhenTheElementIsThere) {
   const ParsedDocument document("<a:r xmlns:a='urn:a'/>");
   EXPECT_EQ(Deviations{}, DeviationsOf([&](DeviationSink &sink) {
               EXPECT_TRUE(RequireElementQName(document.Cursor(), "r", "urn:a", sink));
@@ -37,7 +37,7 @@ Deviations ReportOfFirstChild(const std::string &content) {
   });
 }
 
-TEST(RequireElementQNameOfCursor, ReportsTheElementThatIsThere) {
+TEST(RequireElementQNameOfCursor, ReportsTheElementFoundInstead) {
   EXPECT_EQ((Deviations{{"Expected element 'Subject' not found.", "saml:Issuer", "", "element saml:Subject",
                          "element saml:Issuer"}}),
             ReportOfFirstChild("<saml:Issuer/>"));
@@ -63,7 +63,7 @@ TEST(RequireElementQNameOfCursor, ReportsNoPlaceWhenThereIsNoTree) {
             DeviationsOf([&](DeviationSink &sink) { RequireElementQName(nowhere, "r", "urn:a", sink); }));
 }
 
-TEST(RequireEmptyElement, ReportsWhatIsThereOnce) {
+TEST(RequireEmptyElement, ReportsOnlyTheFirstContent) {
   const ParsedDocument document("<r><e/>text<e/></r>");
   EXPECT_EQ((Deviations{{"Element 'r' must be empty", "r", "", "no content", "element e"}}),
             DeviationsOf([&](DeviationSink &sink) { RequireEmptyElement(document.Cursor(), sink); }));
@@ -145,7 +145,7 @@ TEST(RequireTextualContent, ReturnsWhetherTheTextWasRead) {
   EXPECT_EQ("text", text);
 }
 
-TEST(GetDateAttribute, ReportsAnotherTextAndKeepsTheDate) {
+TEST(GetDateAttribute, ReportsATextThatIsNotADateAndKeepsTheDate) {
   const ParsedDocument document("<r At='tomorrow'/>");
   EXPECT_EQ((Deviations{{"r/@At is not a date", "r", "At", "a date of the form xsd:dateTime", "tomorrow"}}),
             DeviationsOf([&](DeviationSink &sink) {
@@ -166,7 +166,7 @@ TEST(GetDateAttribute, DoesNotReportAMissingAttributeAgain) {
   EXPECT_EQ(DateTime("2001-01-01T00:00:00Z"), date);
 }
 
-TEST(GetBoolAttribute, ReportsAnotherTextAndKeepsTheFlag) {
+TEST(GetBoolAttribute, ReportsATextThatIsNotABooleanAndKeepsTheFlag) {
   const ParsedDocument document("<r Flag='yes'/>");
   bool flag = true;
   EXPECT_EQ((Deviations{{"r/@Flag is not a Boolean", "r", "Flag", "true, 1, false or 0", "yes"}}),
@@ -174,7 +174,7 @@ TEST(GetBoolAttribute, ReportsAnotherTextAndKeepsTheFlag) {
   EXPECT_TRUE(flag);
 }
 
-TEST(GetULongOptionalAttribute, ReportsAnotherTextAndKeepsTheNumber) {
+TEST(GetULongOptionalAttribute, ReportsATextThatIsNotANumberAndKeepsTheNumber) {
   const ParsedDocument document("<r Count='-1'/>");
   boost::optional<std::uint64_t> count = std::uint64_t{99};
   EXPECT_EQ(
