@@ -273,7 +273,6 @@ TEST(ProbeServer, TriesEachAddressAndUsesTheFirstThatAnswers) {
   EXPECT_EQ(Outcome::ACCEPTED, probe.handshake->outcome);
 }
 
-<<<<<<< HEAD
 /// Accepts TCP connections at 127.0.0.2 and never reads from them.
 class SilentNeighbour {
 public:
@@ -310,9 +309,6 @@ TEST(ProbeServer, UsesTheFirstInOrderWhenSeveralAddressesAnswer) {
 }
 
 TEST(ProbeServer, TriesOnlySoManyAddresses) {
-=======
-TEST(ProbeServer, TriesALimitedNumberOfAddresses) {
->>>>>>> e9ae3c5c18a2e566fb45543d6ba684165c6b762c
   const Testing::UnusedPort port;
   const System::ScopedNameLookup lookup(
       [](const std::string &) { return System::AddressList(1000, boost::asio::ip::make_address("127.0.0.1")); });
