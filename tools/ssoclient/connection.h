@@ -36,7 +36,7 @@ void AddConnectionOptions(CLI::App &app, ConnectionOptions &options);
 /// @throws Tarvel::Http::MalformedURLException
 void CheckConnection(const ConnectionOptions &options);
 
-/// What the connections to the service trust; null for plain http.
+/// The TLS context of the connections to the service, with the certificates that it trusts; null for plain http.
 /// @throws Tarvel::IOException, Tarvel::Crypto::CryptoException
 Tarvel::Ref<Tarvel::Ssl::SSLContext> CreateContext(const ConnectionOptions &options);
 
