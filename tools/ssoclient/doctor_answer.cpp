@@ -135,7 +135,7 @@ bool IsAnyOf(std::string_view name, std::initializer_list<std::string_view> name
   return std::find(names.begin(), names.end(), name) != names.end();
 }
 
-/// Whether the fault says that it is the credentials that are missing.
+/// Whether the fault reports that credentials are missing.
 bool AsksForCredentials(const ServiceAnswer &answer) {
   if (answer.faultName.namespaceUri == SoapNamespaces::WSSE ||
       answer.faultName.namespaceUri == SoapNamespaces::WSSE_11) {
