@@ -172,7 +172,7 @@ void DescribeBody(const DoctorExchange &exchange, DoctorCheck &check) {
   check.found.push_back(std::string("The answer is ") + DescriptionOf(exchange.answer.kind) + ".");
 }
 
-/// By how many microseconds this machine's clock is ahead of the service's. `date` counts as the middle of the exchange.
+/// By how many microseconds this machine's clock is ahead of `date`, which counts as the middle of the exchange.
 std::int64_t LeadOf(const DoctorExchange &exchange, const DateTime &date) {
   return exchange.receivedAt.PlusMicroseconds(-exchange.durationMicroseconds / 2).MicrosecondsSince(date);
 }

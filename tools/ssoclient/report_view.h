@@ -17,7 +17,7 @@ namespace SsoClient::Tool {
 /// A report, and whether it includes the checks of trust.
 struct ReportView {
   TokenReport report;
-  bool usesTrust = true; ///< false: there was no trusted certificate, so the token is not accepted or refused
+  bool usesTrust = true; ///< false: there was no trusted certificate, so the token is neither accepted nor refused
 };
 
 /// The view of `report`, which was made without trusted certificates: the checks of the keys and of the signature
