@@ -27,9 +27,10 @@ namespace SsoClient {
 /// use `TokenVerifier::Verify` to get a token. An empty optional means that the text does not say it, or not in a form that
 /// can be read. Texts are as the sender wrote them, so they may contain control characters.
 struct UnverifiedClaims {
-  bool isAssertion = false;            ///< whether the text contains an assertion; if not, nothing else is set
-  boost::optional<std::string> id;     ///< the `ID`
-  boost::optional<std::string> issuer; ///< the text of the `Issuer`
+  /// Whether the text contains an assertion, also of another version than SAML 2.0; if not, nothing else is set.
+  bool isAssertion = false;
+  boost::optional<std::string> id;                           ///< the `ID`
+  boost::optional<std::string> issuer;                       ///< the text of the `Issuer`
   boost::optional<Tarvel::System::DateTime> issueInstant;    ///< when it was issued, as the issuer states
   boost::optional<std::string> nameId;                       ///< the subject's identifier as written
   boost::optional<std::string> nameIdFormat;                 ///< the `Format` of the subject's identifier

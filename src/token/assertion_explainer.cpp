@@ -26,6 +26,7 @@ using Tarvel::System::DateTime;
 using Tarvel::Xml::ElementNode;
 using Tarvel::Xml::Security::KeyInfoResolver;
 
+constexpr const char *NO_ASSERTION = "There is no assertion.";
 constexpr const char *NO_METHOD = "The Method of the SubjectConfirmation is missing or not known.";
 constexpr const char *NO_END = "The NotOnOrAfter of the Conditions cannot be read.";
 
@@ -35,7 +36,7 @@ public:
   Explainer(const VerifyOptions &options, TokenReport &report, ReportRecorder &recorder)
       : m_options(options), m_report(report), m_recorder(recorder) {}
 
-  /// Returns whether there is an assertion.
+  /// Returns whether there is an assertion, of any version.
   bool ExplainForm(const ElementNode &root);
 
   void ExplainProperties() {
@@ -60,7 +61,7 @@ public:
   }
 
 private:
-  void SummarizeForm(const ElementNode &root, bool hasAssertion);
+  void SummarizeForm(const ElementNode &root);
   void ExplainIdentifiers();
   void ExplainValidity();
   void ExplainConfirmation();
@@ -82,26 +83,35 @@ bool Explainer::ExplainForm(const ElementNode &root) {
   NodeFilterIterator iterator(&root, std::shared_ptr<const NodeFilter>(std::shared_ptr<void>(), &filter));
   ParseSamlAssertionElement(iterator, m_read.assertion, m_recorder);
   m_read.isFormAccepted = !m_recorder.HasFailed();
-  const bool hasAssertion = ElementQNameIs(m_read.assertion.element, "Assertion", Namespaces::SAML);
-  SummarizeForm(root, hasAssertion);
-  return hasAssertion;
+  SummarizeForm(root);
+  return m_read.assertion.element != nullptr;
 }
 
-void Explainer::SummarizeForm(const ElementNode &root, bool hasAssertion) {
+void Explainer::SummarizeForm(const ElementNode &root) {
   if (m_read.isFormAccepted) {
     m_recorder.Summarize("The assertion has the accepted form, and its signature covers it.");
     return;
   }
-  const std::string count = std::to_string(m_recorder.CountFindings());
-  if (hasAssertion && m_read.assertion.element == &root) {
-    m_recorder.Summarize("Deviations from the accepted form: " + count + ".");
-    return;
+  const ElementNode *const element = m_read.assertion.element;
+  const bool isSaml2 = ElementQNameIs(element, "Assertion", Namespaces::SAML);
+  if (!isSaml2 || element != &root) {
+    m_recorder.ReplaceFirstRemedy(RemedyForSurroundings(isSaml2));
   }
-  m_recorder.ReplaceFirstRemedy(RemedyForSurroundings(hasAssertion));
-  m_recorder.Summarize(hasAssertion ? "The document element is not an assertion, so the first assertion in it was "
-                                      "examined; deviations from the accepted form: " +
-                                          count + "."
-                                    : "There is no SAML 2.0 assertion.");
+  const std::string count = std::to_string(m_recorder.CountFindings()) + ".";
+  if (!element) {
+    m_recorder.Summarize(NO_ASSERTION);
+  } else if (!isSaml2) {
+    m_recorder.Summarize(
+        "There is no SAML 2.0 assertion, so the first element of that name was examined; deviations from "
+        "the accepted form: " +
+        count);
+  } else if (element != &root) {
+    m_recorder.Summarize("The document element is not an assertion, so the first assertion in it was examined; "
+                         "deviations from the accepted form: " +
+                         count);
+  } else {
+    m_recorder.Summarize("Deviations from the accepted form: " + count);
+  }
 }
 
 void Explainer::ExplainIdentifiers() {
@@ -254,7 +264,7 @@ void ExplainAssertion(const ElementNode &root, const KeyInfoResolver &resolver, 
                       TokenReport &report, ReportRecorder &recorder) {
   Explainer explainer(options, report, recorder);
   if (!explainer.ExplainForm(root)) {
-    recorder.SkipFrom(Check::IDENTIFIERS, "There is no SAML 2.0 assertion.");
+    recorder.SkipFrom(Check::IDENTIFIERS, NO_ASSERTION);
     return;
   }
   explainer.ExplainProperties();

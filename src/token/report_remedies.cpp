@@ -133,9 +133,9 @@ std::string RemedyFor(const TokenReport &report, Check check, const Finding &fin
   return std::string();
 }
 
-std::string RemedyForSurroundings(bool hasAssertion) {
-  return hasAssertion ? "Give only the Assertion element, with the namespace declarations that it needs."
-                      : "Give a SAML 2.0 assertion: there is none in this document.";
+std::string RemedyForSurroundings(bool hasSaml2) {
+  return hasSaml2 ? "Give only the Assertion element, with the namespace declarations that it needs."
+                  : "Give a SAML 2.0 assertion: there is none in this document.";
 }
 
 } // namespace SsoClient

@@ -14,8 +14,8 @@ namespace SsoClient {
 /// when `check` is one of the signature's. The text contains names from the report, which are printable.
 std::string RemedyFor(const TokenReport &report, TokenReport::Check check, const TokenReport::Finding &finding);
 
-/// What to do about a document whose document element is not an assertion.
-/// @param hasAssertion whether there is an assertion in it
-std::string RemedyForSurroundings(bool hasAssertion);
+/// What to do about a document whose document element is not a SAML 2.0 assertion.
+/// @param hasSaml2 whether there is such an assertion in it
+std::string RemedyForSurroundings(bool hasSaml2);
 
 } // namespace SsoClient

@@ -133,7 +133,8 @@ public:
     } else {
       // There is no refusal of the value if none of the keys that KeyInfo selects can be used; other keys are tried only
       // for the report.
-      m_recorder.SetNotDone(m_signature.isValueChecked ? "No trusted key made the signature." : "No key could be tried.");
+      m_recorder.SetNotDone(m_signature.isValueChecked ? "No trusted key made the signature."
+                                                       : "No key could be tried.");
     }
   }
 

@@ -74,7 +74,7 @@ const ElementNode *FirstChildElement(const ElementNode &parent) {
   return nullptr;
 }
 
-/// The text directly in the child element of that name; empty when there is none.
+/// The text directly in the child element of that name; empty if it has no text, or if no child has the name.
 std::string_view TextOfChild(const ElementNode &parent, std::string_view name, const ElementNode *&child) {
   child = parent.FindChildElement(name);
   for (const Node *node = child ? child->GetFirstChild() : nullptr; node; node = node->GetNextSibling()) {

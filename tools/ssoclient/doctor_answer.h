@@ -43,7 +43,8 @@ ServiceAnswer ReadAnswer(const std::string &body, std::string_view contentType);
 const char *NameOf(ServiceAnswer::Kind kind);
 const char *DescriptionOf(ServiceAnswer::Kind kind);
 
-/// Whether a WS-Trust service that this client can use wrote the answer. @param answer null when there is none
+/// Whether a WS-Trust service that this client can use wrote the answer.
+/// @param answer null without an answer
 DoctorCheck CheckTrust(const ServiceAnswer *answer);
 
 } // namespace SsoClient::Tool

@@ -71,23 +71,28 @@ private:
   std::future<End> m_end = m_promise->get_future();
 };
 
+/// The result of a look-up. It is a class of this file so that no template with a type of Boost is exported.
+struct FoundAddresses {
+  AddressList addresses;
+};
+
 /// The addresses of a name that is not an address. @throws NetworkException; the message is only the reason.
 AddressList WaitForLookup(const std::string &host, Clock::time_point deadline) {
-  const auto promise = std::make_shared<std::promise<AddressList>>();
-  std::future<AddressList> result = promise->get_future();
+  const auto promise = std::make_shared<std::promise<FoundAddresses>>();
+  std::future<FoundAddresses> result = promise->get_future();
   const Ref<System::ScheduledItem> lookup =
       System::StartSharedLookup(host, [promise](const AddressList &addresses, const std::exception_ptr &failure) {
         if (failure) {
           promise->set_exception(failure);
         } else {
-          promise->set_value(addresses);
+          promise->set_value({addresses});
         }
       });
   if (result.wait_until(deadline) != std::future_status::ready) {
     lookup->Cancel();
     throw System::TimeoutException("the resolver did not answer in time");
   }
-  return result.get();
+  return result.get().addresses;
 }
 
 AddressList LookUp(const std::string &host, int port, std::int64_t timeoutMicroseconds) {

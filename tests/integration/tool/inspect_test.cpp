@@ -195,9 +195,12 @@ TEST(Inspect, ShowsUnknownForFactsThatAForeignTokenLacks) {
   EXPECT_THAT(result.out, HasSubstr("\nIn the token:    CN=sts,O=Example\n"));
 }
 
-TEST(Inspect, RefusesAnAssertionOfAnEarlierVersion) {
-  ExpectResult(RunTool({"inspect", "../foreign/saml-1.1.xml"}), 5, "",
-               "ssoclient: token invalid: Element 'saml1:Assertion' has unexpected namespace\n");
+TEST(Inspect, ShowsAnAssertionOfAnEarlierVersion) {
+  const ordered_json shown = InspectJson("../foreign/saml-1.1.xml");
+  EXPECT_EQ(false, shown["verified"]);
+  EXPECT_TRUE(shown["id"].is_null());
+  EXPECT_EQ("Element 'saml1:Assertion' has unexpected namespace",
+            CheckIn(shown["report"], "form")["findings"].at(0)["message"]);
 }
 
 TEST(Inspect, ShowsOrRefusesEachAttackAndNeverFails) {

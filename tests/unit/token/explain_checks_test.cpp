@@ -281,17 +281,33 @@ TEST_F(ExplainChecks, ATokenInAnotherDocumentIsReportedButNotAccepted) {
 }
 
 TEST_F(ExplainChecks, NothingIsDoneWithoutAnAssertion) {
-  for (const std::string text : {"<html/>", "<Assertion xmlns=\"urn:oasis:names:tc:SAML:1.0:assertion\"/>"}) {
-    const TokenReport report = Explain(text);
+  const TokenReport report = Explain("<html/>");
+  EXPECT_EQ("Give a SAML 2.0 assertion: there is none in this document.",
+            report.Get(Check::FORM).findings.at(0).remedy);
+  EXPECT_EQ("There is no assertion.", report.Get(Check::FORM).summary);
+  for (std::size_t index = 2; index < report.checks.size(); ++index) {
+    EXPECT_EQ(Outcome::NOT_DONE, report.checks[index].outcome);
+    EXPECT_EQ("There is no assertion.", report.checks[index].summary);
+  }
+  EXPECT_FALSE(report.claims.isAssertion);
+  EXPECT_FALSE(report.claims.id);
+}
+
+TEST_F(ExplainChecks, AnAssertionOfAnEarlierVersionIsReportedButNotAccepted) {
+  for (const std::string begin : {"", "<html/>"}) {
+    const std::string token = "<Assertion xmlns=\"urn:oasis:names:tc:SAML:1.0:assertion\" ID=\"_1\"/>";
+    const TokenReport report = Explain("<e>" + begin + token + "</e>");
+    EXPECT_FALSE(report.accepted);
+    EXPECT_EQ("Expected element 'Assertion' not found.", report.refusal);
     EXPECT_EQ("Give a SAML 2.0 assertion: there is none in this document.",
               report.Get(Check::FORM).findings.at(0).remedy);
-    EXPECT_EQ("There is no SAML 2.0 assertion.", report.Get(Check::FORM).summary);
-    for (std::size_t index = 2; index < report.checks.size(); ++index) {
-      EXPECT_EQ(Outcome::NOT_DONE, report.checks[index].outcome);
-      EXPECT_EQ("There is no SAML 2.0 assertion.", report.checks[index].summary);
-    }
-    EXPECT_FALSE(report.claims.isAssertion);
-    EXPECT_FALSE(report.claims.id);
+    EXPECT_EQ("There is no SAML 2.0 assertion, so the first element of that name was examined; deviations from the "
+              "accepted form: " +
+                  std::to_string(report.Get(Check::FORM).findings.size()) + ".",
+              report.Get(Check::FORM).summary);
+    EXPECT_LT(5u, report.Get(Check::FORM).findings.size());
+    EXPECT_TRUE(report.claims.isAssertion);
+    EXPECT_EQ("_1", report.claims.id);
   }
 }
 

@@ -26,7 +26,7 @@ constexpr std::size_t MAX_PROBED_REFUSALS = 100;    ///< of a handshake; a probe
 struct ServerRefusal {
   /// The kinds of reasons.
   enum class Kind : std::int32_t {
-    OTHER = 0,
+    OTHER = 0,       ///< a reason that has no kind of its own
     EXPIRED,         ///< a certificate is no longer valid
     NOT_YET_VALID,   ///< a certificate is not valid yet
     OTHER_NAME,      ///< the server's certificate is for other names
@@ -38,7 +38,7 @@ struct ServerRefusal {
     OTHER_THUMBPRINT ///< the server's certificate has another thumbprint than the expected one
   };
 
-  Kind kind = Kind::OTHER; ///< which kind of reason
+  Kind kind = Kind::OTHER; ///< the kind of the reason
   std::string text;        ///< in the words of an `SSLException`, without the endpoint
   std::size_t depth = 0;   ///< of the certificate in the chain that was verified; 0 is the server's
 
@@ -62,9 +62,9 @@ struct HandshakeProbe {
     FAILED     ///< any other failure; see `failure`
   };
 
-  Outcome outcome = Outcome::FAILED; ///< how the handshake ended
+  Outcome outcome = Outcome::FAILED; ///< how it ended
   std::string failure; ///< the message of the exception that a connection gets; empty if the server was accepted
-  std::int64_t durationMicroseconds = 0; ///< of the handshake, without the connect
+  std::int64_t durationMicroseconds = 0; ///< how long it took
   std::string version;                   ///< such as "TLSv1.3"; empty if none was agreed on
   std::string cipher;                    ///< the cipher suite's name; empty if none was agreed on
 
@@ -91,15 +91,15 @@ struct AddressProbe {
   };
 
   std::string address;                   ///< IPv4 or IPv6, without brackets
-  Outcome outcome = Outcome::FAILED;     ///< how the attempt ended
+  Outcome outcome = Outcome::FAILED;     ///< how it ended
   std::string reason;                    ///< the system's text; empty if the address answered
-  std::int64_t durationMicroseconds = 0; ///< of the attempt
+  std::int64_t durationMicroseconds = 0; ///< how long it took
 };
 
 /// What `ProbeServer` has found.
 struct ServerProbe {
   std::string lookupFailure;           ///< why the name has no address; empty if it has
-  std::int64_t lookupMicroseconds = 0; ///< how long the look-up of the name took
+  std::int64_t lookupMicroseconds = 0; ///< how long the look-up took
   std::size_t addressCount = 0;        ///< how many addresses the name has, also those that were not tried
   std::vector<AddressProbe> addresses; ///< in the order in which a connection tries them
 
@@ -117,8 +117,8 @@ struct ServerProbe {
 /// @param parameter as in `SSLStream::AsyncHandshake`.
 /// @param timeoutMicroseconds for each of the three steps.
 /// @throws TypeMismatchException for a context of another class. @throws InvalidStateException when there are no threads
-///         or descriptors, and when OpenSSL has cleaned itself up. @throws OutOfMemoryException. What is wrong with the
-///         server is never an exception.
+///         or descriptors, and when OpenSSL has cleaned itself up before the handshake. What is wrong with the server is
+///         never an exception.
 TARVEL_API ServerProbe ProbeServer(const std::string &host, int port, const Ref<SSLContext> &context,
                                    const std::string &parameter, std::int64_t timeoutMicroseconds);
 
