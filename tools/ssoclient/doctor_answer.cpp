@@ -74,7 +74,7 @@ const ElementNode *FirstChildElement(const ElementNode &parent) {
   return nullptr;
 }
 
-/// The text directly in the child element of that name; empty if it has no text, or if no child has the name.
+/// The text directly in the child element of that name; empty if that has no text, or if there is no such child.
 std::string_view TextOfChild(const ElementNode &parent, std::string_view name, const ElementNode *&child) {
   child = parent.FindChildElement(name);
   for (const Node *node = child ? child->GetFirstChild() : nullptr; node; node = node->GetNextSibling()) {

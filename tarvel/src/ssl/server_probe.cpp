@@ -44,7 +44,7 @@ std::string SystemText(int error) {
   return boost::system::system_category().message(error);
 }
 
-/// How an operation ended: the failure's message, empty for success; and when.
+/// How an operation ended: the failure's message, empty for success; and how long it took.
 struct End {
   std::string failure;
   std::int64_t durationMicroseconds = 0;
@@ -62,7 +62,7 @@ public:
 
   bool WaitUntil(Clock::time_point deadline) const { return m_end.wait_until(deadline) == std::future_status::ready; }
 
-  /// Waits for the call. To be called once.
+  /// Waits for the call. Call it only once.
   End Get() { return m_end.get(); }
 
 private:
@@ -134,7 +134,7 @@ public:
   const Ref<System::TcpClientSocket> &GetSocket() const noexcept { return m_socket; }
 
 private:
-  /// Removes what the report says elsewhere.
+  /// Removes the target, which the probe contains elsewhere.
   std::string WithoutTarget(std::string failure) const {
     const std::string begin = "Cannot connect to " + m_target + ": ";
     return failure.compare(0, begin.size(), begin) == 0 ? failure.substr(begin.size()) : std::move(failure);
@@ -156,7 +156,7 @@ private:
   Completion m_completion;
 };
 
-/// Closes the sockets of all attempts at the end, whatever happens.
+/// A list of attempts. Its destructor closes all of their sockets.
 class AttemptList {
 public:
   AttemptList() = default;
@@ -172,7 +172,7 @@ public:
     m_attempts.push_back(std::make_unique<Attempt>(address, port));
   }
 
-  /// Waits for all. @return the first in order that has a connection, or null.
+  /// Waits for all attempts. @return the first one, in the order of the addresses, that has a connection, or null.
   const Attempt *Finish(Clock::time_point deadline, std::vector<AddressProbe> &probes) {
     const Attempt *connected = nullptr;
     for (const std::unique_ptr<Attempt> &attempt : m_attempts) {

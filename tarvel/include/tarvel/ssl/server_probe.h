@@ -26,7 +26,7 @@ constexpr std::size_t MAX_PROBED_REFUSALS = 100;    ///< of a handshake; a probe
 struct ServerRefusal {
   /// The kinds of reasons.
   enum class Kind : std::int32_t {
-    OTHER = 0,       ///< a reason that has no kind of its own
+    OTHER = 0,       ///< any other reason
     EXPIRED,         ///< a certificate is no longer valid
     NOT_YET_VALID,   ///< a certificate is not valid yet
     OTHER_NAME,      ///< the server's certificate is for other names
@@ -42,8 +42,8 @@ struct ServerRefusal {
   std::string text;        ///< in the words of an `SSLException`, without the endpoint
   std::size_t depth = 0;   ///< of the certificate in the chain that was verified; 0 is the server's
 
-  /// That certificate, which need not be one of those that the server sent. Null for one that cannot be read, and for
-  /// `OTHER_THUMBPRINT`.
+  /// The certificate at that depth, which need not be one of those that the server sent. Null for one that cannot be
+  /// read, and for `OTHER_THUMBPRINT`.
   Ref<const Crypto::Certificate> certificate;
 };
 
@@ -70,13 +70,13 @@ struct HandshakeProbe {
 
   /// The certificates that the server sent, its own first. Null for one that cannot be read.
   Crypto::CertificateList chain;
-  std::size_t chainLength = 0; ///< how many the server sent, also those that were not kept
+  std::size_t chainLength = 0; ///< how many the server sent, including those that were not kept
 
   /// The trusted certificate at which the chain ends; null when it ends at none, and when a thumbprint replaced the
   /// check of the chain.
   Ref<const Crypto::Certificate> anchor;
 
-  /// Every reason, in the order in which they were found: the first one is the one in `failure`.
+  /// Every reason, in the order in which they were found. `failure` reports the first one.
   std::vector<ServerRefusal> refusals;
 };
 
@@ -108,9 +108,10 @@ struct ServerProbe {
 };
 
 /// Looks up `host`, connects to each of its addresses, and performs a TLS handshake with the first that answers. The
-/// same code as for every other connection decides whether the server is accepted, but here it goes on after the first
-/// reason against a certificate, and notes each. The connection is closed after the handshake, whether or not the server
-/// was accepted; nothing else is sent. No session is resumed. Blocks the calling thread, which must not be an I/O thread.
+/// same code as for every other connection decides whether the server is accepted, but here it continues after the
+/// first reason against a certificate, and records each. The connection is closed after the handshake, whether or not
+/// the server was accepted; nothing else is sent. No session is resumed. Blocks the calling thread, which must not be
+/// an I/O thread.
 /// @param host as in `System::TcpClientSocket::AsyncConnect`.
 /// @param port 1 to 65535.
 /// @param context what to trust, made by `CreateSSLContext`; null to perform no handshake.
