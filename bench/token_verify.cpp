@@ -5,8 +5,8 @@
 ///
 /// Keys of the JSON that are not self-explanatory: "ours" is `CreateSamlToken`. "verifier" has an entry for each number of
 /// trusted certificates: "factory_us" is `CreateSamlToken`, "verifier_us" is `TokenVerifier::Verify`, both for the token of
-/// 5 KB, and "ratio" divides the second by the first. "explain" has the time of `TokenVerifier::Explain` for tokens of 5 KB
-/// and 50 KB, and its ratio to that of `Verify`.
+/// 5 KB, and "ratio" divides the second by the first. "explain" has the times of `TokenVerifier::Explain` and `Verify`
+/// for tokens of 5 KB and 50 KB, and "ratio" divides the first by the second.
 
 #include "program.h"
 #include "xmlsec_verifier.h"
@@ -59,7 +59,7 @@ const std::string &GetSmallToken() {
 
 constexpr int THREAD_COUNTS[] = {1, 2, 4, 8, 16};
 
-/// Of the tokens of 5 KB and 50 KB.
+/// The indices of the tokens of 5 KB and 50 KB in `GetTokens()`.
 constexpr std::size_t EXPLAINED_TOKENS[] = {1, 2};
 
 const Tarvel::Crypto::CertificateList &GetTrusted() {
@@ -74,8 +74,8 @@ void VerifyByUs(benchmark::State &state, const std::string &xml) {
   }
 }
 
-/// The files of 16 different certificates. The last is the one that made the signatures, as in a list to which new keys are
-/// added at the front.
+/// The files of 16 different certificates. The key of the last one made the signatures, like the oldest key of a list
+/// to which new keys are added at the front.
 constexpr const char *CERTIFICATE_FILES[] = {
     "tokens/other.crt",     "tokens/sts-rsa-2.crt",  "tokens/sts-rsa3072.crt", "tokens/sts-rsa-expired.crt",
     "tokens/sts-ec256.crt", "tokens/sts-ec384.crt",  "tokens/sts-ec521.crt",   "tokens/holder.crt",

@@ -107,7 +107,7 @@ struct Verdict {
   std::set<std::string> uris;
 };
 
-/// Whether the report says what the verification did.
+/// Whether the report agrees with the verdict of the verification.
 bool Agrees(const Tarvel::Xml::Security::SignatureReport &report, const std::string &verdict) {
   if (report.refusals.empty()) {
     return verdict == "genuine";

@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// Arbitrary bytes as a token, explained by different verifiers: the report says what a verification does with the bytes, it
+/// Different verifiers explain arbitrary bytes, read as a token: the report agrees with the verification of the bytes,
 /// keeps all promises of token_report.h, and explaining throws nothing. The same for the tree of a well-formed text.
 
 #include "support/data_file.h"

@@ -96,10 +96,10 @@ int main(int argc, char **argv) {
     if (argc == 5) {
       return AcquireAndReport(arguments, std::cout);
     }
-    std::ofstream file(argv[5], std::ios::app); // as collectors expect: they follow a file that grows
+    std::ofstream file(argv[5], std::ios::app); // appends: collectors follow a file that grows
     return AcquireAndReport(arguments, file);
   } catch (const std::exception &error) {
-    std::cerr << "failed: " << error.what() << '\n'; // a file that cannot be read, an address that is not valid
+    std::cerr << "failed: " << error.what() << '\n'; // such as a file that cannot be read
     return FAILED;
   }
 }

@@ -37,7 +37,7 @@ std::size_t Utf8Length(const std::string &text, std::size_t begin) {
   return isOverlong || isBeyond ? 0 : length;
 }
 
-/// A 64-bit integer is a text in JSON.
+/// OTLP/JSON writes a 64-bit integer as a text.
 std::string Quoted(std::int64_t value) {
   return '"' + std::to_string(value) + '"';
 }
@@ -46,7 +46,7 @@ std::string Nanoseconds(Time time) {
   return Quoted(std::chrono::duration_cast<std::chrono::nanoseconds>(time.time_since_epoch()).count());
 }
 
-/// A number with a point, whatever the process's locale.
+/// A number with a decimal point, in every locale.
 std::string Number(double value) {
   const auto micros = static_cast<std::int64_t>(value * 1e6 + 0.5);
   std::string fraction = std::to_string(micros % 1000000);

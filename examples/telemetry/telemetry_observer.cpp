@@ -66,7 +66,7 @@ void TelemetryObserver::OnStarted(const OperationInfo &operation) {
 void TelemetryObserver::OnRequestSent(const OperationInfo &operation, const SsoClient::RequestSentEvent &event) {
   Span span;
   span.spanId = NewSpanId();
-  span.name = "POST"; // the conventions' name of a client's span without a template of the address
+  span.name = "POST"; // the semantic conventions' name of a client span without a URL template
   span.kind = SpanKind::CLIENT;
   span.start = system_clock::now();
   span.attributes = Server();

@@ -15,14 +15,15 @@
 
 namespace Telemetry {
 
-/// Each operation is a trace. Its identifier is that of the operation, so log lines with the same "opId" can be found.
-/// The operation is a span of kind INTERNAL, and each exchange with the service is a span of kind CLIENT below it, by
-/// the semantic conventions for HTTP. A fault and a failure are events of the operation's span.
+/// Each operation is a trace. The identifier of the trace is that of the operation without hyphens, so the log lines
+/// with this "opId" can be found. The operation is a span of kind INTERNAL. Each exchange with the service is a span of
+/// kind CLIENT below it, by the semantic conventions for HTTP. A fault and a failure are events of the operation's
+/// span.
 ///
 /// The metrics are the histogram `http.client.request.duration` and the counter `ssoclient.operations`.
 ///
-/// Safe on any thread, as an observer must be. It writes short lines to a buffered stream; a program with much traffic
-/// would put them into a queue, because operations wait for the observer.
+/// Safe on any thread, like every observer must be. Operations wait for the observer. This one writes short lines to a
+/// buffered stream; a program with much traffic would put them into a queue.
 class TelemetryObserver final : public SsoClient::OperationObserver {
 public:
   /// @param output must outlive the observer
@@ -37,7 +38,7 @@ public:
   void OnFault(const SsoClient::OperationInfo &operation, const SsoClient::FaultEvent &event) override;
   void OnEnded(const SsoClient::OperationInfo &operation, const SsoClient::OperationEndedEvent &event) override;
 
-  /// Writes the metrics. A program calls it once a minute or so, and at its end.
+  /// Writes the metrics. A program calls it about once a minute, and at its end.
   void WriteMetrics();
 
 private:

@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// Compares what a verifier explains about a token with what it does with the token.
+/// Compares a verifier's report on a token with the same verifier's verification of it.
 
 #pragma once
 
@@ -25,17 +25,17 @@ struct JudgedVerifier {
 /// What `Verify` did.
 struct Verification {
   std::shared_ptr<const SsoClient::SamlToken> token; ///< null if it was refused
-  std::string exceptionClass;                        ///< unqualified; "undocumented" for any other
+  std::string exceptionClass;                        ///< unqualified, or "undocumented"; empty if it was accepted
   std::string refusal;                               ///< the exception's message
   std::uint32_t line = 0;                            ///< of an `XMLParseException`
   std::uint32_t column = 0;
 };
 
-/// A judged text or element.
+/// The results for a text or an element.
 struct Judgement {
   Verification verification;
   SsoClient::TokenReport report;
-  std::string contradictions; ///< one on each line: what the report says wrongly; empty if it is right
+  std::string contradictions; ///< the mistakes of the report, one on each line; empty if it is right
 };
 
 /// Verifies and explains `xml`. The clock must not move during the call.

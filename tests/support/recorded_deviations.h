@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// `RecordedDeviations`, a sink that goes on, and the deviations of a rule as comparable texts.
+/// `RecordedDeviations`, a sink that collects deviations, and the deviations of a rule as comparable texts.
 
 #pragma once
 
@@ -41,7 +41,7 @@ private:
   std::size_t m_capacity;
 };
 
-/// What a test expects of a deviation. An element is its name as written.
+/// What a test expects of a deviation. `element` is the element's name as written.
 struct ExpectedDeviation {
   std::string message;
   std::string element;
@@ -61,8 +61,9 @@ inline ExpectedDeviation AsExpected(const SsoClient::Deviation &deviation) {
           deviation.attribute, deviation.allowed, deviation.found};
 }
 
-/// Runs `rule`, a function of a sink, as a report does and as a verification does, and expects that the exception of the
-/// verification has the text of the first deviation, or that there is neither. Returns the deviations.
+/// Calls `rule` with a sink that collects, like that of a report, and with a sink that throws, like that of a
+/// verification. Expects that the exception has the text of the first deviation, or that there is neither. Returns the
+/// deviations.
 template <typename Rule>
 std::vector<ExpectedDeviation> DeviationsOf(const Rule &rule) {
   RecordedDeviations recorded;

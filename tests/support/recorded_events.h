@@ -18,7 +18,7 @@ namespace Testing {
 /// The lines of an operation:
 /// - "started NAME",
 /// - "sent ACTION" and, in a negotiation, ", leg N",
-/// - "received STATUS REASON, CONTENT-TYPE" and the leg, or "received nothing: WHY",
+/// - "received STATUS REASON, CONTENT-TYPE" or "received nothing: WHY", and the leg,
 /// - "fault {NAMESPACE}NAME CODE: TEXT (DETAIL)",
 /// - "ended", or "ended CLASS: MESSAGE".
 class RecordedEvents final : public SsoClient::OperationObserver {

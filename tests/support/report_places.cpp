@@ -57,7 +57,7 @@ std::string NumberOf(const ElementNode &element) {
   return nodes > MAX_NODES_BEFORE ? "[?]" : number > 1 ? "[" + std::to_string(number) + "]" : "";
 }
 
-/// The names and numbers from the document element on.
+/// The path of `element`: the names and numbers of the elements from the document element to it.
 std::string PathTo(const ElementNode *element) {
   std::string path;
   for (; element; element = Tarvel::Xml::AsElement(element->GetParent())) {

@@ -11,8 +11,8 @@
 
 namespace Testing {
 
-/// What is wrong with the elements, attributes, paths, lines and columns of the findings, one on each line; empty if
-/// nothing is.
+/// What is wrong with the elements, paths, lines and columns of the first 20 findings of each check, one finding on
+/// each line; empty if nothing is.
 /// @param document the tree of the text that was explained
 std::string FindWrongPlaces(const SsoClient::TokenReport &report, const Tarvel::Xml::Document &document);
 

@@ -26,7 +26,7 @@ constexpr std::size_t MAX_REFERENCES = 10;
 constexpr std::size_t MAX_NAMED_CERTIFICATES = 16;
 constexpr std::size_t LONGEST_TEXT = 1024 + 40; // with the note of how much was cut
 
-/// Collects what is wrong. Each rule is a function that reads as its promise.
+/// Collects what is wrong. Each rule is a function that is named after its promise.
 class Contradictions {
 public:
   void Expect(bool holds, const std::string &otherwise) {
@@ -73,7 +73,7 @@ void ExpectFindingsOfFailedChecksOnly(const TokenReport &report, Contradictions 
                  name + (hasFindings ? " has findings" : " has no findings") + ", but " +
                      GetOutcomeName(result.outcome));
     listed += result.findings.size();
-    // One finding is kept for each check that follows.
+    // Place for one finding is reserved for each later check.
     wrong.Expect(result.unlistedFindings == 0 || listed + CHECKS >= TokenReport::MAX_FINDINGS,
                  name + " leaves out findings of a report with " + std::to_string(listed));
     for (const TokenReport::Finding &finding : result.findings) {
@@ -105,7 +105,7 @@ void ExpectTheOutcomeOfVerify(const TokenReport &report, const Verification &ver
   }
 }
 
-/// The checks that can fail with that exception.
+/// Whether a verification whose first failed check is `check` can throw that exception.
 bool CanThrow(Check check, const std::string &exceptionClass) {
   switch (check) {
   case Check::WELL_FORMED:
@@ -211,7 +211,7 @@ void ExpectConsistentKeys(const TokenReport &report, const JudgedVerifier &verif
     isMade = isMade || key.madeSignature;
     isUsable = isUsable || key.isUsable;
   }
-  // A key that KeyInfo does not select is not tried by a verification if it selects another one.
+  // If KeyInfo selects a trusted key, a verification tries no other key.
   const bool isSelected = std::any_of(report.trustedKeys.begin(), report.trustedKeys.end(),
                                       [](const auto &key) { return key.isNamed && !key.madeSignature; });
   wrong.Expect(!Passed(report, Check::SIGNATURE) || isMade, "SIGNATURE passed, but no key made it");
@@ -223,7 +223,7 @@ void ExpectConsistentKeys(const TokenReport &report, const JudgedVerifier &verif
   }
 }
 
-/// The claims as far as a token says the same.
+/// The claims that a token has, too, with the values that a token has for unknown ones.
 std::string ClaimsLikeAToken(UnverifiedClaims claims) {
   claims.isAssertion = true;
   claims.issuer.reset();

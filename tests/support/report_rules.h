@@ -10,8 +10,8 @@
 
 namespace Testing {
 
-/// Everything in which `report` breaks a promise of token_report.h or contradicts what `verification` did, one on each
-/// line; empty if there is nothing. The clock must still show the time of the verification.
+/// How `report` breaks promises of token_report.h or contradicts `verification`, one contradiction on each line; empty
+/// if there is none. The clock must still show the time of the verification.
 std::string FindContradictions(const SsoClient::TokenReport &report, const Verification &verification,
                                const JudgedVerifier &verifier);
 

@@ -1,6 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// The texts of a `TokenReport`, and a description that two reports share only if they say the same.
+/// The texts of a `TokenReport`, and a description of a report. Two reports with the same description have the same
+/// content.
 
 #pragma once
 

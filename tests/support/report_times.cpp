@@ -21,7 +21,7 @@ bool BeginsWith(const std::string &text, const std::string &beginning) {
   return text.compare(0, beginning.size(), beginning) == 0;
 }
 
-/// By how much the clock is too early or too late; positive if it is.
+/// By how many microseconds the clock is too early or too late; negative if it is not.
 struct Misses {
   std::int64_t start = 0;
   std::int64_t end = 0;

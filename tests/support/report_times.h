@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// Checks the times in a report by arithmetic of its own.
+/// Checks the times in a report without the library's arithmetic.
 
 #pragma once
 
@@ -11,8 +11,8 @@
 
 namespace Testing {
 
-/// What the report says wrongly about the time of validity, one on each line; empty if nothing is. The clock must still show
-/// the time of the report.
+/// The mistakes of the report about times, one on each line; empty if there is none. The clock must still show the time
+/// of the report.
 std::string FindWrongTimes(const SsoClient::TokenReport &report, const SsoClient::VerifyOptions &options);
 
 } // namespace Testing

@@ -19,7 +19,7 @@ Time Now();
 /// For example "2026-01-02T03:04:05.006Z".
 std::string TimeText(Time time);
 
-/// The form of an HTTP header (RFC 9110, section 5.6.7), for example "Fri, 02 Jan 2026 03:04:05 GMT".
+/// The form of a time in HTTP headers (RFC 9110, section 5.6.7), for example "Fri, 02 Jan 2026 03:04:05 GMT".
 std::string HttpTimeText(Time time);
 
 /// Reads the form that `TimeText` writes. The fraction is optional, and cut to milliseconds. Returns none for any other

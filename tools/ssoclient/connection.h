@@ -36,7 +36,8 @@ void AddConnectionOptions(CLI::App &app, ConnectionOptions &options);
 /// @throws Tarvel::Http::MalformedURLException
 void CheckConnection(const ConnectionOptions &options);
 
-/// What the connections to the service trust; null for plain http.
+/// The TLS context of the connections to the service; null for plain http. It trusts the file of --ca, or the system's
+/// store if neither --ca nor --thumbprint is given.
 /// @throws Tarvel::IOException, Tarvel::Crypto::CryptoException
 Tarvel::Ref<Tarvel::Ssl::SSLContext> CreateContext(const ConnectionOptions &options);
 

@@ -74,7 +74,7 @@ const ElementNode *FirstChildElement(const ElementNode &parent) {
   return nullptr;
 }
 
-/// The text directly in the child element of that name; empty if it has no text, or if no child has the name.
+/// The text directly in the child element of that name; empty if that has no text, or if there is no such child.
 std::string_view TextOfChild(const ElementNode &parent, std::string_view name, const ElementNode *&child) {
   child = parent.FindChildElement(name);
   for (const Node *node = child ? child->GetFirstChild() : nullptr; node; node = node->GetNextSibling()) {
@@ -135,7 +135,7 @@ bool IsAnyOf(std::string_view name, std::initializer_list<std::string_view> name
   return std::find(names.begin(), names.end(), name) != names.end();
 }
 
-/// Whether the fault says that it is the credentials that are missing.
+/// Whether the fault reports that credentials are missing.
 bool AsksForCredentials(const ServiceAnswer &answer) {
   if (answer.faultName.namespaceUri == SoapNamespaces::WSSE ||
       answer.faultName.namespaceUri == SoapNamespaces::WSSE_11) {

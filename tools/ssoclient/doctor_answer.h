@@ -28,7 +28,7 @@ struct ServiceAnswer {
 
   Kind kind = Kind::EMPTY;
   Tarvel::Xml::QName element; ///< the document element of XML; the first element in the body of a message
-  std::string problem;        ///< of MALFORMED: the parser's message
+  std::string problem;        ///< of MALFORMED and TEXT: the parser's message
   std::string faultCode;      ///< of a fault: as the service wrote it; empty if it has none
   Tarvel::Xml::QName
       faultName; ///< the code with its prefix resolved; its namespace is empty if the prefix is not bound
@@ -36,14 +36,14 @@ struct ServiceAnswer {
 };
 
 /// @param contentType the header's value; may be empty
-/// @throws nothing that the body could cause
+/// @throws nothing because of the body
 ServiceAnswer ReadAnswer(const std::string &body, std::string_view contentType);
 
 /// The kind's name in JSON, such as "soap 1.1 fault", and for people, such as "a SOAP 1.1 fault".
 const char *NameOf(ServiceAnswer::Kind kind);
 const char *DescriptionOf(ServiceAnswer::Kind kind);
 
-/// Whether the answer is that of a WS-Trust service that this client can speak with.
+/// Whether a WS-Trust service that this client can use wrote the answer.
 /// @param answer null without an answer
 DoctorCheck CheckTrust(const ServiceAnswer *answer);
 

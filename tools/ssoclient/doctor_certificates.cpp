@@ -45,7 +45,7 @@ void CheckDates(const Certificate &certificate, const CertificateFile &file, con
 
 void CheckKey(const Certificate &certificate, const CertificateFile &file, DoctorCheck &check, Tally &tally) {
   if (file.isAuthority) {
-    return; // TLS has rules of its own for its keys
+    return; // TLS has its own rules for keys
   }
   ++tally.trusted;
   const std::string refusal = Tarvel::Crypto::ReadCertificateFacts(certificate).keyRefusal;
@@ -74,7 +74,7 @@ bool Contains(const CertificateFile &file, const Certificate &wanted) {
                      [&wanted](const auto &certificate) { return certificate->GetDer() == wanted.GetDer(); });
 }
 
-/// Says whether the server's chain ends in one of the authorities. TLS has refused the server when it does not.
+/// Reports whether the server's chain ends in one of the authorities. If it does not, TLS has refused the server.
 void CheckAnchor(const std::vector<CertificateFile> &files, const Tarvel::Ssl::ServerProbe &probe, DoctorCheck &check) {
   const auto authorities =
       std::find_if(files.begin(), files.end(), [](const CertificateFile &file) { return file.isAuthority; });

@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// The check of the certificates that the command line names.
+/// The check of the certificates of --trust and --ca.
 
 #pragma once
 

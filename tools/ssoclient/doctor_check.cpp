@@ -42,7 +42,7 @@ std::string Column(const std::string &text, std::size_t width, Colour colour, bo
   return Coloured(text, colour, usesColour) + std::string(width - std::min(width, text.size()), ' ');
 }
 
-/// Adds the text, wrapped, after `columns`. Its later lines, and the next text, begin below its first one.
+/// Adds the text, wrapped, after `columns`, which become blanks for its later lines and the next text.
 void AddText(std::string &lines, std::string &columns, const std::string &text, const TextStyle &style) {
   for (const std::string &line : Wrap(text, style.width - INDENT)) {
     lines += columns + line + "\n";

@@ -41,7 +41,7 @@ struct DoctorCheck {
   void Fail(ExitCode code, const std::string &advice);
 };
 
-/// A text that others wrote, for people: printable, and cut at 200 octets.
+/// A text that others wrote, for people: cut at 200 octets, then made printable.
 std::string Shown(std::string_view text);
 
 /// `Shown(text)` with a capital letter at the beginning and a full stop at the end.
@@ -55,7 +55,7 @@ std::string DurationText(std::int64_t microseconds);
 
 std::int64_t Milliseconds(std::int64_t microseconds);
 
-/// The texts with a comma and a blank between them.
+/// The texts with `separator` between them.
 std::string JoinTexts(const std::vector<std::string> &texts, std::string_view separator = ", ");
 
 /// The exit code of the first check that failed; DONE if none did.

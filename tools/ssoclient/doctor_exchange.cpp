@@ -29,7 +29,7 @@ constexpr std::int64_t NOTABLE_SECONDS = 60;
 
 constexpr const char *WRONG_PATH = "Correct the host, port and path in --sts.";
 
-/// What a status means here. The others are described by their class.
+/// What a status means for a token service. The other statuses get a general description.
 struct StatusRow {
   int status;
   const char *text;
@@ -94,7 +94,7 @@ void ReadResponse(Tarvel::Http::ClientResponse &response, DoctorExchange &exchan
   }
 }
 
-/// Whether the exception says that nothing at all came before the end of the connection.
+/// Whether the exception reports that the connection ended before any octet arrived.
 bool SaysNothingCame(const Tarvel::Http::HttpException &failure) {
   const std::string_view text = failure.what();
   constexpr std::string_view END = "the connection ended before it";
@@ -172,7 +172,7 @@ void DescribeBody(const DoctorExchange &exchange, DoctorCheck &check) {
   check.found.push_back(std::string("The answer is ") + DescriptionOf(exchange.answer.kind) + ".");
 }
 
-/// By how many microseconds this machine's clock is ahead of the service's. The date is that of the middle of the exchange.
+/// By how many microseconds this machine's clock is ahead of `date`, which counts as the middle of the exchange.
 std::int64_t LeadOf(const DoctorExchange &exchange, const DateTime &date) {
   return exchange.receivedAt.PlusMicroseconds(-exchange.durationMicroseconds / 2).MicrosecondsSince(date);
 }

@@ -22,7 +22,7 @@ namespace SsoClient::Tool {
 /// A request and what became of it.
 struct DoctorExchange {
   std::string failure;           ///< why there is no answer; empty when there is one
-  bool hasOtherProtocol = false; ///< there is no answer because what came is not HTTP
+  bool hasOtherProtocol = false; ///< there is no answer because what arrived is not HTTP
   int status = 0;
   std::string reason;
   std::string contentType;
@@ -42,10 +42,10 @@ struct DoctorExchange {
 DoctorExchange Exchange(const DoctorTarget &target, const Tarvel::Ref<Tarvel::Ssl::SSLContext> &context,
                         const std::string &thumbprint, std::int64_t timeoutMicroseconds);
 
-/// Status, headers, size, and what answers there. @param exchange null when no request was sent, for `reason`
+/// Status, headers, size, and what answers. @param exchange null when no request was sent; `reason` is then why
 DoctorCheck CheckHttp(const DoctorExchange *exchange, const std::string &reason);
 
-/// The difference of this machine's clock and the service's. @param exchange null when no request was sent
+/// The difference between this machine's clock and the service's. @param exchange null when no request was sent
 DoctorCheck CheckClock(const DoctorExchange *exchange);
 
 } // namespace SsoClient::Tool

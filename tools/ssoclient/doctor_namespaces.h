@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// The namespaces by which an answer is recognised, and of the request that asks for it.
+/// The namespaces by which an answer is recognised, and the request that is sent.
 
 #pragma once
 

@@ -26,7 +26,7 @@ const char *TextOf(Outcome outcome) {
   return "failed";
 }
 
-/// What to do when no address answers and the first one ended like this.
+/// What to do when no address answers, and the attempt to reach the first one had this outcome.
 const char *AdviceFor(Outcome outcome) {
   switch (outcome) {
   case Outcome::REFUSED:

@@ -86,7 +86,7 @@ std::string Describe(const DoctorTarget &target, const ServerRefusal &refusal, c
   return refusal.certificate ? DescribeCertificate(target, refusal, now) : Sentence(refusal.text);
 }
 
-/// Adds the text if it is not there yet.
+/// Adds the text unless `texts` contains it already.
 void AddOnce(std::vector<std::string> &texts, const std::string &text) {
   if (std::find(texts.begin(), texts.end(), text) == texts.end()) {
     texts.push_back(text);

@@ -23,7 +23,7 @@ std::string DaysText(std::int64_t microseconds) {
   return days == 0 ? "less than a day" : Count(days, "day");
 }
 
-/// How a handshake failed that got no certificate refused.
+/// A handshake that failed for another reason than a refused certificate.
 struct Breakdown {
   Outcome outcome;
   const char *text;

@@ -22,10 +22,10 @@ constexpr std::int64_t SOON_DAYS = 30;
 /// Whole days until the certificate ends, rounded down: negative when it has ended.
 std::int64_t DaysLeft(const Tarvel::Crypto::Certificate &certificate, const Tarvel::System::DateTime &now);
 
-/// Such as "93 days left", "expired 12 days ago" and "becomes valid in 3 days".
+/// How long the certificate is valid, such as "93 days left", "expired 12 days ago" and "becomes valid in 3 days".
 std::string LeftText(const Tarvel::Crypto::Certificate &certificate, const Tarvel::System::DateTime &now);
 
-/// The facts that both lists of certificates have in JSON.
+/// The facts of a certificate in JSON, for the server's chain and for the files of the command line.
 nlohmann::ordered_json CertificateJson(const Tarvel::Crypto::Certificate &certificate,
                                        const Tarvel::System::DateTime &now);
 

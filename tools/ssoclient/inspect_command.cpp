@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// `ssoclient inspect`: shows what a token says, what deviates in it from the accepted form, and that it was not verified.
+/// `ssoclient inspect`: shows what a token says, how it deviates from the accepted form, and that it was not verified.
 
 #include "command.h"
 #include "token_view.h"

@@ -50,7 +50,7 @@ constexpr Command COMMANDS[] = {
      "  ssoclient verify --trust sts.pem --explain token.xml\n"
      "  ssoclient verify --trust sts.pem --trust next-sts.pem --tolerance 60 --format json - <token.xml\n",
      DefineVerify},
-    {"inspect", "Show what a token says, and what deviates in it, without verifying it",
+    {"inspect", "Show what a token says, and how it deviates from the accepted form, without verifying it",
      "  ssoclient inspect token.xml\n"
      "  ssoclient inspect --format json - <token.xml\n",
      DefineInspect},

@@ -42,7 +42,7 @@ void Warn(std::string_view message, const OutputOptions &output);
 /// (`Tarvel::StringUtil::MAX_LINE_BYTES`).
 void WriteLine(std::string_view text);
 
-/// The same for a message that a failure may follow, so that it is written in JSON only when verbose.
+/// The same for a message that a failure may follow. When the format is JSON, only a verbose command writes it.
 void Note(std::string_view message, const OutputOptions &output);
 
 /// From now on each line that the library logs is written to standard error.

@@ -15,8 +15,8 @@
 
 namespace SsoClient::Tool {
 
-/// Saves a refused token in the file of --save-refused, and adds a hint to the failure. Outlives the service that uses its
-/// sink. Main thread only.
+/// Saves a refused token in the file of --save-refused, and adds a hint to the failure. Must outlive the service that
+/// uses its sink. Main thread only.
 class RefusedToken {
 public:
   RefusedToken(const TokenOutputOptions &options, const OutputOptions &output);
@@ -26,8 +26,8 @@ public:
   /// A function that calls `Keep`.
   ServiceOptions::RefusedTokenSink GetSink();
 
-  /// Saves the token, if it has a file, and says where it is. If that fails, there is only a warning: what counts is the
-  /// failure that follows.
+  /// Saves the token, if there is a file for it, and reports where it is. If it cannot be saved, there is only a
+  /// warning, because the failure that follows is more important.
   void Keep(const std::string &xml);
 
   /// Returns what `call` returns.

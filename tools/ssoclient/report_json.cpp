@@ -73,14 +73,14 @@ Json KeyJson(const TokenReport::TrustedKey &key) {
           {"madeSignature", key.madeSignature}};
 }
 
-/// Whether a named certificate is trusted is not known if no certificate is.
+/// Without trusted certificates, "trusted" is null, because the answer is not known.
 Json NamedCertificateJson(const TokenReport::NamedCertificate &certificate, bool usesTrust) {
   return {{"subject", OrNull(certificate.subject)},
           {"sha256", OrNull(certificate.thumbprint)},
           {"trusted", usesTrust ? Json(certificate.isTrusted) : Json(nullptr)}};
 }
 
-/// What the keys outside the report cannot hold.
+/// The claims that have no key outside the report.
 Json ClaimsJson(const UnverifiedClaims &claims) {
   return {{"issuer", OrNull(claims.issuer)},
           {"issueInstant", claims.issueInstant ? Json(UtcText(*claims.issueInstant)) : Json(nullptr)},

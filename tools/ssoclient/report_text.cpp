@@ -25,7 +25,7 @@ Colour ColourOf(Outcome outcome) noexcept {
   return outcome == Outcome::PASSED ? Colour::GREEN : Colour::RED;
 }
 
-/// A part of a finding in a line of its own.
+/// A part of a finding in its own line, or nothing if there is no such part.
 std::string LineUnlessEmpty(std::string_view label, std::string_view value) {
   return value.empty() ? std::string() : DETAIL + std::string(label) + PrintableValue(value);
 }
@@ -43,7 +43,7 @@ std::string PlaceText(const TokenReport::Finding &finding) {
   return text.empty() ? text : DETAIL + text;
 }
 
-/// @param isRepeated whether the line before has the same remedy
+/// @param isRepeated whether the finding before has the same remedy
 Table::Row FindingRow(const TokenReport::Finding &finding, bool isRepeated) {
   std::string found = PrintableValue(finding.message) + PlaceText(finding) +
                       LineUnlessEmpty("wanted: ", finding.wanted) + LineUnlessEmpty("found: ", finding.found);
@@ -66,14 +66,15 @@ void AddCheck(const TokenReport::CheckResult &result, Table &table) {
   }
 }
 
-/// Whether the check needs something that only a caller of `verify` gives.
+/// Whether the check needs trusted certificates or demands, which only `verify` has.
 bool NeedsCaller(TokenReport::Check check) noexcept {
   using Check = TokenReport::Check;
   return check == Check::KEYS || check == Check::SIGNATURE || check == Check::AUDIENCE ||
          check == Check::REQUIRED_CONFIRMATION;
 }
 
-/// Whether the check is shown. Without trust, only deviations are, and the checks for which they leave nothing to look at.
+/// Whether the check is shown. Without trust, it is shown only if it has failed, or if an earlier failure left nothing
+/// to check.
 bool IsShown(const TokenReport::CheckResult &result, bool usesTrust) noexcept {
   return usesTrust || (result.outcome != Outcome::PASSED && !NeedsCaller(result.check));
 }
@@ -117,7 +118,7 @@ void AddNamedCertificate(const TokenReport::NamedCertificate &certificate, bool 
   }
 }
 
-/// What the token's own lines cannot show: names and methods in a form that is not known.
+/// The claims that the token's own lines do not show: the issuer, the time of issue, and names and methods as written.
 void AddClaims(const UnverifiedClaims &claims, LabelledLines &lines) {
   lines.AddUnlessEmpty("Issuer:", claims.issuer.value_or(""));
   lines.AddUnlessEmpty("Issued:", claims.issueInstant ? UtcText(*claims.issueInstant) : "");

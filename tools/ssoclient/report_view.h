@@ -14,20 +14,22 @@
 
 namespace SsoClient::Tool {
 
-/// A report, and whether it is about trust, too.
+/// A report, and whether it includes the checks of trust.
 struct ReportView {
   TokenReport report;
-  bool usesTrust = true; ///< false: there was no trusted certificate, so nothing can be accepted or refused
+  bool usesTrust = true; ///< false: there was no trusted certificate, so the token is neither accepted nor refused
 };
 
-/// `report`, which was made without trusted certificates, without what it says about their keys.
+/// The view of `report`, which was made without trusted certificates: the checks of the keys and of the signature
+/// become "not done".
 ReportView WithoutTrust(TokenReport report);
 
-/// All of the report.
+/// The whole report as JSON.
 nlohmann::ordered_json ReportJson(const ReportView &view);
 
-/// For people: a table of the checks, and lines about the signature's references, the trusted keys, and the named certificates.
-/// Without trust, the table lists only what deviates, and is left out if nothing does.
+/// The report for people: lines about the claims, the signature's references, the trusted keys and the named
+/// certificates, and a table of the checks. Without trust, the table has only the checks that did not pass, and is left
+/// out if there are none.
 std::string ReportText(const ReportView &view, const TextStyle &style);
 
 } // namespace SsoClient::Tool

@@ -37,8 +37,8 @@ std::size_t OctetsOf(std::string_view text, std::size_t count) noexcept {
   return octets;
 }
 
-/// The octets of the beginning of `text` that fit in a line of `most` octets: up to a blank, or in a word that is longer than
-/// a line, such as a path or a URI, up to a separator in its second half.
+/// How many octets of `text` the first line gets, at most `most`: up to a blank; in a word that is longer than a line,
+/// such as a path or a URI, up to and including a separator in the line's second half; otherwise `most`.
 std::size_t PlaceToBreak(std::string_view text, std::size_t most) noexcept {
   // A blank right after a full line is a place to break, too.
   const std::size_t blank = text.substr(0, most + 1).rfind(' ');
@@ -49,7 +49,7 @@ std::size_t PlaceToBreak(std::string_view text, std::size_t most) noexcept {
   return separator != std::string_view::npos && separator >= most / 2 ? separator + 1 : most;
 }
 
-/// Adds the lines of `text`, which has no line feed, to `lines`, each indented as `text` is.
+/// Wraps `text`, which has no line feed, and adds its lines to `lines`, all indented like `text`.
 void WrapLine(std::string_view text, std::size_t width, std::vector<std::string> &lines) {
   const std::size_t blanks = std::min(text.find_first_not_of(' '), text.size());
   const std::string indent(blanks < width / 2 ? blanks : 0, ' ');

@@ -14,10 +14,10 @@
 
 namespace SsoClient::Tool {
 
-/// `text` in lines of at most `width` characters, broken at blanks, and within a word only if the word is longer than a line;
-/// then, if possible, after a separator of paths and URIs.
-/// A line feed in `text` ends a line, too. What follows in a line that begins with blanks is indented in the same way. At least
-/// one line.
+/// Breaks `text` into lines of at most `width` characters. Lines are broken at blanks. A word is broken only if it is
+/// longer than a line, if possible after a separator of paths and URIs. A line feed in `text` ends a line, too. If a
+/// line begins with blanks, the lines into which it is broken are all indented in the same way. Returns at least one
+/// line.
 /// @param width at least 1
 std::vector<std::string> Wrap(std::string_view text, std::size_t width);
 
@@ -27,8 +27,8 @@ struct Cell {
   Colour colour = Colour::NONE;
 };
 
-/// A table of four columns. The first two are as wide as their longest cells; the other two share what is left of the width,
-/// and their cells are wrapped.
+/// A table of four columns. The first two are as wide as their longest cells. The other two share the rest of the
+/// width, and their cells are wrapped.
 class Table {
 public:
   static constexpr std::size_t COLUMNS = 4;

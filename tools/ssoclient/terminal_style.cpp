@@ -17,7 +17,7 @@ constexpr std::size_t DEFAULT_WIDTH = 100;
 constexpr std::size_t LEAST_WIDTH = 60; // the columns of a table become unreadable below this
 constexpr std::size_t GREATEST_WIDTH = 1000;
 
-/// The number in the variable `value`, or 0 if it is not a decimal number.
+/// The number that the environment variable contains, or 0 if `value` is null or not a decimal number.
 std::size_t NumberIn(const char *value) noexcept {
   const std::string_view text = value ? value : "";
   std::size_t number = 0;

@@ -27,12 +27,12 @@ struct TextStyle {
   bool hasColours = false;
 };
 
-/// The width is that of COLUMNS if it is a number greater than 0, else that of the terminal, else 100; a width below 60 is 60,
-/// and one above 1,000 is 1,000. Text is coloured only on a terminal, and not if NO_COLOR is set and not empty, or TERM is
-/// "dumb".
+/// The width is COLUMNS if that is a number greater than 0, otherwise the terminal's width, otherwise 100. A width
+/// below 60 becomes 60, and a width above 1,000 becomes 1,000. Text is coloured only on a terminal, and not if NO_COLOR
+/// is set and not empty, or if TERM is "dumb".
 TextStyle ChooseStyle(const TerminalFacts &facts) noexcept;
 
-/// The style of what is written to the descriptor.
+/// The style of text that is written to the descriptor.
 TextStyle StyleOf(int descriptor) noexcept;
 
 /// `text` with the sequences that colour it; unchanged if `hasColours` is false, or there is nothing to colour.

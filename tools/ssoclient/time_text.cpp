@@ -12,7 +12,7 @@ constexpr std::uint64_t HOUR_SEC = 60 * MINUTE_SEC;
 constexpr std::uint64_t DAY_SEC = 24 * HOUR_SEC;
 constexpr std::uint64_t DAYS_ALONE_FROM_SEC = 100 * DAY_SEC;
 
-/// `seconds` in `unit`, and what is left of them in the next smaller unit.
+/// `seconds` in `unit`, and the rest in the next smaller unit.
 std::string InUnits(std::uint64_t seconds, std::uint64_t unit, std::string_view name, std::uint64_t smaller,
                     std::string_view smallerName) {
   std::string text = std::to_string(seconds / unit) + std::string(name);

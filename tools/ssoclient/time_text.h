@@ -14,11 +14,11 @@ namespace SsoClient::Tool {
 /// `time` in UTC, with milliseconds.
 std::string UtcText(const Tarvel::System::DateTime &time);
 
-/// A number of seconds in its two largest units, such as "7 h 12 min" or "45 s". The sign is ignored, and what is left is
-/// dropped: 59.9 minutes are "59 min 54 s". From 100 days on, only days are shown.
+/// A number of seconds in its two largest units, such as "7 h 12 min" or "45 s". The sign is ignored, and smaller units
+/// are dropped: 3,675 seconds are "1 h 1 min". From 100 days on, only days are shown.
 std::string SpanText(std::int64_t seconds);
 
-/// When `time` is, seen from `now`: "in 7 h 12 min", "3 d 4 h ago", or "now" if less than a second is between them.
+/// How far `time` is from `now`: "in 7 h 12 min", "3 d 4 h ago", or "now" if they differ by less than a second.
 std::string WhenText(const Tarvel::System::DateTime &time, const Tarvel::System::DateTime &now);
 
 } // namespace SsoClient::Tool

@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// `TokenFacts`, what a token says, as far as it says it.
+/// `TokenFacts`, what a token says.
 
 #pragma once
 
@@ -26,8 +26,8 @@ struct CertificateFacts {
   std::string sha256; ///< the thumbprint
 };
 
-/// What a token says. An empty optional means that the token does not say it, or not in a form that can be read; a verified
-/// token says everything, except that a bearer token has no certificate.
+/// What a token says. An empty optional means that the token does not say it, or not in a form that can be read. For a
+/// verified token, no optional is empty, except the certificate of a bearer token.
 struct TokenFacts {
   boost::optional<std::string> id;
   boost::optional<PrincipalId> subject;

@@ -71,7 +71,8 @@ Json ArrayOf(const Items &items) {
   return array;
 }
 
-/// The keys are in one place: callers rely on the keys and their order, and a change to either needs a new "schema".
+/// All keys are in this place, because callers rely on the keys and their order: a change to either needs a new
+/// "schema".
 Json FactsJson(const TokenFacts &facts) {
   return {{"id", OrNull(facts.id)},
           {"subject", OrNull(facts.subject)},

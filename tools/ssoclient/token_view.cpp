@@ -23,7 +23,7 @@ TokenView InspectToken(std::string xml) {
   const TokenVerifier verifier({});
   TokenReport report = verifier.Explain(xml);
   if (!report.claims.isAssertion) {
-    verifier.Verify(xml); // throws the exception whose text the report has
+    verifier.Verify(xml); // throws the exception that the report quotes
     throw ParseException(report.refusal);
   }
   TokenView view;

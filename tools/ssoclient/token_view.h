@@ -20,7 +20,7 @@
 
 namespace SsoClient::Tool {
 
-/// What is shown of a token. The facts of a token that was not verified are mere claims.
+/// What is shown of a token. If the token was not verified, its facts are mere claims.
 struct TokenView {
   bool verified = false;
   boost::optional<TokenFacts> facts; ///< `boost::none` for a token that was refused: what it says is not shown
@@ -28,15 +28,15 @@ struct TokenView {
   /// What was asked for and is not in the token; `boost::none` for a token that the service has not just issued.
   boost::optional<std::vector<UnmetRequest>> unmet;
   boost::optional<ReportView> report; ///< `boost::none` if none was asked for
-  /// From when the text counts how far times are away.
+  /// The text shows how far times are from this moment.
   Tarvel::System::DateTime now = Tarvel::System::GetUtcDateTime();
 };
 
 /// The view of a verified token.
 TokenView ViewOf(const SamlToken &token);
 
-/// The view of the first assertion in `xml`, of which nothing is verified, with a report of what deviates from the accepted
-/// form.
+/// The view of the first assertion in `xml`, with a report of how `xml` deviates from the accepted form. Nothing in it
+/// is verified.
 /// @throws Tarvel::Xml::XMLParseException when `xml` is not a well-formed document.
 /// @throws ParseException when there is no assertion in it.
 TokenView InspectToken(std::string xml);

@@ -37,22 +37,23 @@ void AddTokenArgument(CLI::App &app, std::string &file);
 /// @throws Tarvel::IOException, Tarvel::Crypto::CryptoException
 Tarvel::Crypto::CertificateList LoadTrusted(const TrustOptions &options, const OutputOptions &output);
 
-/// What `file` contains ("-" is standard input): all of it, or enough of a file that is too long for the parser to refuse it.
+/// The content of `file` ("-" is standard input). Reads at most one octet more than
+/// the parser accepts, so that the parser refuses a longer file.
 /// @throws Tarvel::IOException
 std::string ReadTokenText(const std::string &file);
 
 /// The token in `file`, verified.
 /// @throws Tarvel::IOException
-/// @throws HintedException for a token that is refused, as the exception of `TokenVerifier::Verify`.
+/// @throws HintedException for a token that is refused: the exception of `TokenVerifier::Verify`, with a hint.
 std::shared_ptr<const SamlToken> ReadToken(const std::string &file, const TokenVerifier &verifier);
 
-/// The same with no demands but a tolerance.
+/// The same, with a clock tolerance as the only demand.
 std::shared_ptr<const SamlToken> ReadToken(const std::string &file, const Tarvel::Crypto::CertificateList &trusted,
                                            std::int64_t toleranceSec);
 
 /// Checks again, with `toleranceSec`, a token that the library has accepted with `DEFAULT_CLOCK_TOLERANCE_SEC`; does
 /// nothing unless `toleranceSec` is less.
-/// @param sink gets the text of a token that is refused
+/// @param sink receives the text of a token that is refused
 /// @throws ParseException
 void RequireWithinTolerance(const SamlToken &token, const Tarvel::Crypto::CertificateList &trusted,
                             std::int64_t toleranceSec, const ServiceOptions::RefusedTokenSink &sink);

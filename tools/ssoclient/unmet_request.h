@@ -21,7 +21,7 @@ struct UnmetRequest {
   std::string wanted;   ///< what was asked for and what the token has instead, as text
 };
 
-/// What `spec` asks for and `facts` do not have, in the order of the keys above. What a token does not say, it does not have.
+/// What `spec` asks for and `facts` do not have, in the order of the keys above. An empty fact counts as missing.
 /// @param askedAt when the request was sent, by this machine's clock
 /// @param toleranceSec how far apart the clocks of this machine and of the service may be; limited to the range from 0
 ///        to `DEFAULT_CLOCK_TOLERANCE_SEC`

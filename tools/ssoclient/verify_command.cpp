@@ -39,8 +39,8 @@ VerifyOptions DemandsOf(const VerifyArguments &arguments) {
   return demands;
 }
 
-/// Shows the token of `xml` if it is verified, and in any case the report.
-/// @throws what refuses the token, after the report has been written
+/// Shows the report, and also the token if it is accepted.
+/// @throws the exception that refuses the token, after the report has been written
 ExitCode Explain(const TokenVerifier &verifier, std::string xml, const OutputOptions &output) {
   TokenView view;
   std::exception_ptr refusal;

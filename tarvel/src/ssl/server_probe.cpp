@@ -45,7 +45,7 @@ std::string SystemText(int error) {
   return boost::system::system_category().message(error);
 }
 
-/// How an operation ended: the failure's message, which is empty for success, and the duration.
+/// How an operation ended: the failure's message, empty for success; and how long it took.
 struct End {
   std::string failure;
   std::int64_t durationMicroseconds = 0;
@@ -63,7 +63,7 @@ public:
 
   bool WaitUntil(Clock::time_point deadline) const { return m_end.wait_until(deadline) == std::future_status::ready; }
 
-  /// Waits for the call. Use it only once.
+  /// Waits for the call. Call it only once.
   End Get() { return m_end.get(); }
 
 private:
@@ -157,7 +157,7 @@ private:
   Completion m_completion;
 };
 
-/// Closes the sockets of all attempts when it is destroyed, also after an exception.
+/// A list of attempts. Its destructor closes all of their sockets.
 class AttemptList {
 public:
   AttemptList() = default;
@@ -173,7 +173,7 @@ public:
     m_attempts.push_back(std::make_unique<Attempt>(address, port));
   }
 
-  /// Waits for all attempts. @return the first attempt, in order, that has a connection, or null.
+  /// Waits for all attempts. @return the first one, in the order of the addresses, that has a connection, or null.
   const Attempt *Finish(Clock::time_point deadline, std::vector<AddressProbe> &probes) {
     const Attempt *connected = nullptr;
     for (const std::unique_ptr<Attempt> &attempt : m_attempts) {

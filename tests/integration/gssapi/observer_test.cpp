@@ -1,5 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
-// What an observer of the handler gets, and that what it throws changes nothing.
+// An observer receives the events of the handler, and its exceptions change nothing.
 
 #include "integration/gssapi/negotiation_fixture.h"
 #include "spnego_handler_impl.h"
@@ -55,7 +55,7 @@ TEST(NegotiationObserver, GetsNumberLengthsMechanismAndStateOfEachLeg) {
   const Bytes first = *handler->NegotiateLeg({});
   const Bytes answer = service.Accept(first);
   handler->NegotiateLeg(answer);
-  handler->NegotiateLeg({}); // asked once more, it has nothing to send
+  handler->NegotiateLeg({}); // called again, it has nothing to send
   EXPECT_EQ(observer->lines,
             (std::vector<std::string>{"leg 1: 0 in, " + std::to_string(first.size()) + " out, mechanism ''",
                                       "leg 2: " + std::to_string(answer.size()) +
@@ -68,7 +68,7 @@ TEST(NegotiationObserver, GetsTheTimeThatALegTook) {
   world.LogIn();
   const auto observer = std::make_shared<LineObserver>();
   std::chrono::steady_clock::time_point now;
-  // Each look at the clock takes 100 microseconds: first the observer's, then that of the handler's limits.
+  // Each reading of the clock takes 100 microseconds. The handler also reads it for its limits.
   const auto clock = [&now] { return now += std::chrono::microseconds(100); };
   SpnegoHandlerImpl(ObservedBy(observer), clock).NegotiateLeg({});
   EXPECT_EQ(observer->durations, std::vector<std::int64_t>{400});

@@ -149,7 +149,7 @@ TEST(OutOfHeap, IsReportedWhenAVerifierIsMade) {
   ExpectNothingElse([] { DemandingVerifier(); }, "done");
 }
 
-/// Explains `xml`, and fails if a report that is returned is not the whole one.
+/// Explains `xml`, and fails if an incomplete report is returned.
 void ExpectWholeReportOrNoMemory(const std::string &xml) {
   const Testing::FixedEnvironment clock;
   const SsoClient::TokenVerifier verifier = DemandingVerifier();
@@ -157,7 +157,7 @@ void ExpectWholeReportOrNoMemory(const std::string &xml) {
   ExpectNothingElse(
       [&] {
         const SsoClient::TokenReport report = verifier.Explain(xml);
-        FailingHeap enough(1'000'000, Shortage::ONCE); // to compare
+        FailingHeap enough(1'000'000, Shortage::ONCE); // for the comparison
         if (Testing::DescribeReport(report) != whole) {
           throw std::logic_error("another report");
         }

@@ -131,7 +131,7 @@ TEST_F(OutOfMemory, NeverCausesATamperedTokenToBeAccepted) {
   ExpectNothingElse(Verification(Changed(Token("ecdsa-p256-sha256")), "sts-ec256"), TAMPERED);
 }
 
-// The certificate in KeyInfo is not a trusted one, so that it is decoded.
+// The certificate in KeyInfo is not trusted, so the report decodes it.
 TEST_F(OutOfMemory, NeverChangesTheReportOnASignature) {
   const Ref<Tarvel::Reader> reader = Tarvel::CreateStringReader(Token("bearer"));
   const Ref<Tarvel::Object> parsed =
@@ -156,7 +156,7 @@ TEST_F(OutOfMemory, IsReportedByVerificationOnTheFirstUseOfAKey) {
   ExpectNothingElse([&] { SsoClient::CreateSamlToken(xml, {Tarvel::Crypto::CreateCertificateFromPem(pem)}); });
 }
 
-/// Fails if a report that is returned is not the whole one.
+/// Explains the token in `file`, and fails if an incomplete report is returned.
 std::function<void()> Explanation(const std::string &file, const std::string &certificate) {
   const SsoClient::TokenVerifier verifier(Tarvel::Crypto::LoadCertificates(DataPath("tokens/" + certificate + ".crt")));
   const std::string xml = ReadDataFile(file);

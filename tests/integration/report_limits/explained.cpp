@@ -32,7 +32,7 @@ TokenVerifier MakeVerifier() {
 Explained Explain(const std::string &xml) {
   static const TokenVerifier verifier = [] {
     TokenVerifier made = MakeVerifier();
-    made.Explain(Testing::ReadDataFile("tokens/bearer.xml")); // makes what is made once for each process
+    made.Explain(Testing::ReadDataFile("tokens/bearer.xml")); // prepares what a process prepares only once
     return made;
   }();
   Explained explained;

@@ -13,8 +13,8 @@ namespace Reports {
 
 struct Explained {
   SsoClient::TokenReport report;
-  std::size_t allocated = 0; ///< octets, all in all
-  std::size_t peak = 0;      ///< octets, the most at once, without the document's text
+  std::size_t allocated = 0; ///< octets, in total
+  std::size_t peak = 0;      ///< the most octets at the same time, without the document's text
 };
 
 /// Explains `xml` with a verifier that trusts three keys and demands an audience and a confirmation.
@@ -23,7 +23,7 @@ Explained Explain(const std::string &xml);
 /// The octets of all texts that are promised to be cut: all except the refusal and the claims.
 std::size_t CountTexts(const SsoClient::TokenReport &report);
 
-/// All findings of `report`.
+/// The number of listed findings.
 std::size_t CountFindings(const SsoClient::TokenReport &report);
 
 } // namespace Reports

@@ -1,5 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
-// Reports on documents of the maximum length, with a million of everything for which a token can be refused.
+// Reports on documents of the maximum length, each filled with pieces of one kind that a report must read or list.
 
 #include "explained.h"
 
@@ -27,16 +27,16 @@ using Bench::Repeat;
 using SsoClient::TokenReport;
 
 constexpr std::size_t MIB = 1024u * 1024;
-constexpr std::size_t MAX_HEAP = 240 * MIB; // at once, in addition to the text
+constexpr std::size_t MAX_HEAP = 240 * MIB; // at the same time, in addition to the text
 
-/// The token bearer.xml with as many pieces as fit, in place of a text in it.
+/// The token bearer.xml, in which as many pieces as possible replace a text.
 struct Largest {
   const char *name;
   std::string replaced;
   std::string begin;
   Piece piece;
   std::string end;
-  std::size_t depth = 0; // of the token below elements of long names
+  std::size_t depth = 0; // how many elements with long names are around the token
 };
 
 void PrintTo(const Largest &document, std::ostream *out) {
@@ -78,7 +78,7 @@ const std::string REFERENCE = "<ds:Reference ";
 const std::string KEY_INFO = "<ds:X509Data>";
 const std::string STATEMENT = "<saml:AuthnStatement";
 
-/// The Base64 text of a genuine certificate, as it is in the token.
+/// The element with a genuine certificate, copied from the token.
 std::string CertificateElement() {
   const std::string token = Testing::ReadDataFile("tokens/bearer.xml");
   const std::size_t begin = token.find("<ds:X509Certificate>");
@@ -128,8 +128,8 @@ std::vector<Largest> Documents() {
       {"WrongCertificates", KEY_INFO, KEY_INFO, Bench::Thin("<ds:X509Certificate~>*</ds:X509Certificate>", 2), ""},
       {"ElementsInTheSignature", "</ds:Signature>", "", Bench::Thin("<ds:Object~/>", 1), "</ds:Signature>"},
       {"OneLongValue", METHOD, "", Always("x"), ""},
-      {"OneLongValueThatSteersATerminal", METHOD, "", Always("&#x202E;&#x85;\xE2\x80\xAE&#13;"), ""},
-      {"OneLongNameThatSteersATerminal", NAME, "", Always("&#x202E;&#x85;\xE2\x80\xAE&#13;"), ""},
+      {"OneLongValueThatControlsATerminal", METHOD, "", Always("&#x202E;&#x85;\xE2\x80\xAE&#13;"), ""},
+      {"OneLongNameThatControlsATerminal", NAME, "", Always("&#x202E;&#x85;\xE2\x80\xAE&#13;"), ""},
       {"OneLongText", "<ds:DigestValue>", "<ds:DigestValue>", Always("*"), ""},
       {"LongNames", SUBJECT, "", Always("<" + LONG_NAME + "/>"), SUBJECT},
       {"FaultsDeepBelowLongNames", VALUE, "", Bench::Thin("<saml:AttributeValue~/>", 1), VALUE, 200},
@@ -146,7 +146,7 @@ TEST_P(ReportOnALargestDocument, IsShortAndCostsNoMoreThanInProportion) {
   EXPECT_FALSE(large.report.accepted);
   EXPECT_EQ(std::string::npos, large.report.refusal.find("more than 1048576 nodes")) << large.report.refusal;
   EXPECT_LT(large.allocated, 6 * small.allocated) << small.allocated;
-  // What each of a thousand findings costs is the same for both documents, so it has a limit of its own.
+  // Both documents may have the maximum number of findings. The ratio does not limit the cost of each; this does.
   EXPECT_LT(large.allocated, 20 * largeXml.size());
   EXPECT_LT(large.peak, MAX_HEAP);
   EXPECT_LE(CountFindings(large.report), TokenReport::MAX_FINDINGS);

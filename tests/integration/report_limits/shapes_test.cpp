@@ -24,7 +24,7 @@ constexpr std::size_t KIB = 1024;
 /// The longest text of a report, with the note of how much was cut.
 constexpr std::size_t LONGEST_TEXT = 1024 + 40;
 
-/// The texts of a finding, and those that are there only once.
+/// How many texts a full report has: seven for each finding, and those that it has only once.
 constexpr std::size_t MAX_TEXTS = SsoClient::TokenReport::MAX_FINDINGS * 7 + 400;
 
 bool IsFull(const SsoClient::TokenReport &report) {
@@ -42,7 +42,7 @@ TEST(ReportsOnHostileShapes, CostNoMoreThanInProportionToTheDocument) {
     const Explained small = Explain(smallXml);
     const Explained large = Explain(largeXml);
     const double growth = static_cast<double>(largeXml.size()) / static_cast<double>(smallXml.size());
-    // 1.6: growing vectors and strings may double once more. A full report has one cost of its own.
+    // 1.6: vectors and strings that grow may double one more time. The last term is for the texts of the report itself.
     EXPECT_LT(static_cast<double>(large.allocated),
               1.6 * growth * static_cast<double>(small.allocated) + static_cast<double>(4 * CountTexts(large.report)));
     EXPECT_LE(CountFindings(large.report), SsoClient::TokenReport::MAX_FINDINGS);
@@ -51,7 +51,7 @@ TEST(ReportsOnHostileShapes, CostNoMoreThanInProportionToTheDocument) {
     ++shapes;
   }
   EXPECT_GT(shapes, 130u);
-  EXPECT_GE(fullReports, 3u); // so the maximum is really reached
+  EXPECT_GE(fullReports, 3u); // so that some reports reach the maximum
 }
 
 } // namespace

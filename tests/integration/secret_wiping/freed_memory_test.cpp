@@ -128,7 +128,7 @@ TEST_P(FreedMemory, ContainsTheWipedRequestBeforeTheResponseIsRead) {
   EXPECT_EQ(watch.Found(), 0);
 }
 
-// An observer needs copies of the password, because its events must not contain it.
+// For an observer, the operation copies the password, to remove it from the events.
 TEST_P(FreedMemory, ContainsNoPasswordOfAnObservedOperation) {
   const std::string password = GetParam();
   const TokenSpec spec = Spec();

@@ -20,12 +20,12 @@ namespace {
 using SsoClient::TokenReport;
 using SsoClient::TokenVerifier;
 
-/// Everything that a host could show or store of a report.
+/// All texts of a report that a host could show or store.
 std::string AllTextsOf(const TokenReport &report) {
   return Testing::DescribeReport(report) + SsoClient::WriteTokenReport(report);
 }
 
-/// The first line of a signature's value, or as much of it as there is.
+/// The first line of each signature's value, if it has at least 40 characters of Base64.
 std::vector<std::string> SignatureValuesOf(const std::string &xml) {
   std::vector<std::string> values;
   for (std::size_t name = xml.find("SignatureValue>"); name != std::string::npos;
@@ -72,7 +72,7 @@ TEST(ReportsAndSecrets, NoReportOnAChangedTokenContainsTheSignatureValue) {
   }
 }
 
-/// Every way in which a signature's value can be refused: where it is refused, a finding might show it.
+/// Each element is refused for another reason. A finding could show the value that is refused.
 TEST(ReportsAndSecrets, NoReportShowsASignatureValueThatItRefuses) {
   const Testing::FixedEnvironment clock;
   const std::string canary = "CanaryCanaryCanaryCanaryCanaryCanaryCanaryCanary";

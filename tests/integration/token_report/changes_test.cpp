@@ -1,5 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
-// The report on each of thousands of changed documents says what a verification does with it.
+// The report on each of thousands of changed documents agrees with the verification of the document.
 
 #include "outcome_count.h"
 #include "token_changes.h"
@@ -27,7 +27,7 @@ using Testing::Judgement;
 using Testing::JudgeText;
 using Testing::RandomSource;
 
-/// Changes for each file.
+/// How many changed texts each file gets.
 std::size_t Changes() {
   return Testing::IS_SANITIZED ? 4 : Testing::Repetitions<std::size_t>(500, 40);
 }
@@ -54,7 +54,7 @@ protected:
     OutcomeCount count;
     RandomSource random(1);
     ForEachChange(14, folder, [&](const std::string &xml, const std::string &change) {
-      // Every other time with the defaults, because the rarer checks come after the signature.
+      // Half of the time the usual verifier: with it, more texts reach the rarer checks, which follow the signature.
       const auto &verifiers = AllVerifiers();
       const JudgedVerifier &verifier = random.OnceIn(2) ? verifiers[random.Below(verifiers.size())] : UsualVerifier();
       const Judgement judgement = JudgeText(verifier, xml);

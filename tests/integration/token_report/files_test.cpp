@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
-// The report on each document of the tests says what a verification does with it, for every choice of certificates and
-// options.
+// The report on each document of the tests agrees with the verification of the document, for every choice of
+// certificates and options.
 
 #include "outcome_count.h"
 #include "token_files.h"
@@ -26,7 +26,7 @@ using Testing::JudgeText;
 
 class ReportsOnFiles : public testing::Test {
 protected:
-  /// The number of texts that are accepted by at least one verifier.
+  /// Expects that each verifier's report on each file is right, and counts the outcomes.
   void ExpectRightReports(const std::string &folder, OutcomeCount &count) {
     for (const TokenFile &file : ReadTokenFiles(folder)) {
       for (const JudgedVerifier &verifier : AllVerifiers()) {
@@ -103,7 +103,7 @@ TEST_F(ReportsOnFiles, AreRightForEveryAssertionElement) {
   EXPECT_GT(count.GetDifferentRefusals(), 50u);
 }
 
-TEST_F(ReportsOnFiles, ShowTheFirstAssertionOfADocumentThatIsNotOne) {
+TEST_F(ReportsOnFiles, ShowTheFirstAssertionWithinAnotherDocument) {
   const std::string token = AllTokenFiles().front().xml;
   const std::string assertion = token.substr(token.find("<saml:Assertion"));
   const SsoClient::TokenReport alone = UsualVerifier().verifier.Explain(assertion);

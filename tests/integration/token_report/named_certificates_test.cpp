@@ -1,5 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
-// Certificates in the KeyInfo of a signature are shown, and never become keys.
+// Certificates in the KeyInfo of a signature are shown, and never become trusted keys.
 
 #include "verifiers.h"
 
@@ -20,7 +20,7 @@ namespace {
 using SsoClient::TokenReport;
 using Testing::Judgement;
 
-/// A new certificate with that subject, as openssl writes it.
+/// A new certificate, made by openssl, with the common name `subject`.
 Tarvel::Ref<const Tarvel::Crypto::Certificate> NewCertificate(const std::string &subject) {
   const Testing::WorkFolder folder;
   const std::string configuration =
@@ -46,7 +46,7 @@ std::string ElementOf(const Tarvel::Crypto::Certificate &certificate) {
   return "<ds:X509Certificate>" + Tarvel::StringUtil::Base64Encode(certificate.GetDer()) + "</ds:X509Certificate>";
 }
 
-TEST(NamedCertificate, OfAStrangerIsShownPrintableAndNotUsed) {
+TEST(NamedCertificate, ThatIsNotTrustedIsShownInPrintableFormAndNotUsed) {
   const Testing::FixedEnvironment clock;
   const auto stranger = NewCertificate("stranger\x1B[31m\xE2\x80\xAE\xC2\x9B");
   const Judgement judgement = JudgeText(UsualVerifier(), WithKeyInfo(ElementOf(*stranger)));

@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// `OutcomeCount`, which shows that a test has reached what it is about.
+/// `OutcomeCount`, which counts outcomes, so that a test can show that it has reached those that it is about.
 
 #pragma once
 

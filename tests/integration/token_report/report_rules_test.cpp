@@ -1,5 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
-// The other tests here count only if wrong reports are noticed: each of these is a right report with one wrong change.
+// The other tests in this folder are useful only if they notice wrong reports. Here, right reports get one wrong change
+// each.
 
 #include "verifiers.h"
 
@@ -41,7 +42,7 @@ const std::string EXPIRED = "tokens/expired.xml";
 
 struct WrongChange {
   const char *name;
-  const std::string &file; // whose report is changed
+  const std::string &file; // the report on it is changed
   std::function<void(TokenReport &)> change;
   const char *noticed; // the beginning of what must be noticed
 };
@@ -116,7 +117,7 @@ const WrongChange CHANGES[] = {
      "SIGNATURE passed, but no key made it"},
     {"ATrustedKeyIsLeftOut", ACCEPTED, [](auto &report) { report.trustedKeys.pop_back(); },
      "some trusted keys are missing"},
-    {"AStrangersCertificateIsTrusted", ACCEPTED,
+    {"AnUnknownCertificateIsTrusted", ACCEPTED,
      [](auto &report) {
        report.namedCertificates.push_back({"CN=stranger", std::string(64, '0'), true});
      },
@@ -165,7 +166,7 @@ TEST(WrongPlace, IsNoticed) {
   }
 }
 
-TEST(IsPrintable, RefusesEveryCharacterThatSteersATerminalAndNoOther) {
+TEST(IsPrintable, RefusesEveryCharacterThatControlsATerminalAndNoOther) {
   for (const char *const text : {"\n",           "\r",           "\t",
                                  "\x1B[2J",      "\x7F",         "\xC2\x80",
                                  "\xC2\x9B",     "\xC2\x9F",     "\xD8\x9C",

@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// Tokens that are changed and then signed again, so that only what they say can be refused.
+/// Tokens that are changed and then signed again, so that they can be refused only for their content.
 
 #pragma once
 

@@ -1,5 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
-// Tokens with a genuine signature that are refused because of what they say: the checks after the signature.
+// Tokens with a genuine signature that are refused for their content.
 
 #include "signed_again.h"
 #include "verifiers.h"
@@ -34,7 +34,7 @@ const SignedChange CHANGES[] = {
      "Invalid or unsupported NameId format 'http://schemas.xmlsoap.org/claims/DN'"},
     {"SubjectWithoutDomain", ">alice@corp.example<", ">alice<",
      "Failed to parse the UPN NameID: `alice'; name or domain part is missing."},
-    {"SubjectThatSteersATerminal", ">alice@corp.example<", ">\xC2\x9B&#x202E;&#13;<",
+    {"SubjectThatControlsATerminal", ">alice@corp.example<", ">\xC2\x9B&#x202E;&#13;<",
      "Failed to parse the UPN NameID: `\xC2\x9B\xE2\x80\xAE\r'; name or domain part is missing."},
     {"GroupWithoutDomain", ">corp.example\\Users<", ">Users<",
      "Failed to parse Group Identity value: `Users'; domain or group missing"},
@@ -64,7 +64,7 @@ private:
   const Testing::FixedEnvironment m_clock;
 };
 
-TEST_P(ReportsOnSignedTokens, RefuseOnlyWhatTheySay) {
+TEST_P(ReportsOnSignedTokens, PassTheSignatureAndRefuseTheContent) {
   const SignedChange &change = GetParam();
   const std::string xml = SignedAgain(ReplacedOnce(Testing::ReadDataFile(change.file), change.from, change.to));
   for (const JudgedVerifier &verifier : AllVerifiers()) {

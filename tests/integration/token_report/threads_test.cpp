@@ -1,5 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
-// Eight threads use one verifier at once.
+// Eight threads use one verifier at the same time.
 
 #include "token_files.h"
 #include "verifiers.h"
@@ -23,7 +23,7 @@ namespace {
 
 constexpr int THREADS = 8;
 
-/// What the verifier does with a text, and how it explains that.
+/// The result of verifying a text, and the report on it.
 std::string OutcomeOf(const SsoClient::TokenVerifier &verifier, const std::string &xml) {
   std::string outcome;
   try {
@@ -42,7 +42,7 @@ TEST(VerifierOnEightThreads, VerifiesAndExplainsLikeOnOneThread) {
   for (const TokenFile &file : files) {
     expected.push_back(OutcomeOf(verifier, file.xml));
   }
-  // A verifier that no thread has used before: whatever it prepares at its first use, it prepares now.
+  // No thread has used this verifier before, so it prepares now what it prepares at its first use.
   const SsoClient::TokenVerifier fresh(UsualVerifier().trusted, UsualVerifier().options);
   std::atomic<int> differences{0};
   Testing::Gate start;

@@ -26,7 +26,8 @@ struct Element {
   bool IsEmpty() const { return tagEnd == end; }
 };
 
-/// The elements of a text. Only tags are read, and what does not fit is skipped: few texts here are not well-formed.
+/// The elements of a text. Reads only tags, and skips end tags without a start tag. That is enough, because most texts
+/// are well-formed.
 std::vector<Element> ElementsOf(const std::string &xml) {
   std::vector<Element> elements;
   std::vector<std::size_t> open;
@@ -100,7 +101,7 @@ constexpr std::string_view VALUES[] = {
     "\xE2\x80\xAE\xC2\x9B[31m",
 };
 
-/// Sometimes so long that a report must cut it, in the middle of a character that must be escaped.
+/// A value. Some are so long that a report must cut them, in the middle of a character that must be escaped.
 std::string AnyValue(RandomSource &random) {
   if (random.OnceIn(12)) {
     std::string value(1015 + random.Below(12), 'v');

@@ -10,14 +10,14 @@
 namespace Reports {
 
 struct TokenFile {
-  std::string name; ///< from tests/data on, such as "tokens/full.xml"
+  std::string name; ///< the path below tests/data, such as "tokens/full.xml"
   std::string xml;
 };
 
-/// All XML files of a folder, such as "tokens", by their names.
+/// All XML files of a folder, such as "tokens", sorted by name.
 std::vector<TokenFile> ReadTokenFiles(const std::string &folder);
 
-/// All of tokens, attacks and requests.
+/// The files of the folders tokens, attacks and requests.
 const std::vector<TokenFile> &AllTokenFiles();
 
 } // namespace Reports

@@ -13,10 +13,10 @@ namespace Reports {
 /// The certificate of a file in tests/data/tokens, such as "sts-rsa".
 Tarvel::Ref<const Tarvel::Crypto::Certificate> Certificate(const std::string &name);
 
-/// Those of a verifier with every list of trusted certificates and every choice of options.
+/// A verifier for each combination of trusted certificates and options.
 const std::vector<Testing::JudgedVerifier> &AllVerifiers();
 
-/// One that trusts all keys of the token service, and has the default options.
+/// A verifier that trusts all keys of the token service, and has the default options.
 const Testing::JudgedVerifier &UsualVerifier();
 
 } // namespace Reports

@@ -1,5 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
-// What `ssoclient doctor` finds out about a service, and what it keeps to itself.
+// What `ssoclient doctor` finds out about a service, and what it does not send.
 
 #include "closed_port.h"
 #include "expect_result.h"
@@ -29,7 +29,7 @@ using Testing::ServerConnection;
 using testing::StartsWith;
 using Testing::TlsSettings;
 
-/// The text without what differs from run to run: durations, days, thumbprints, ports, and the header of a port.
+/// The text without what differs from run to run: durations, days, thumbprints and ports.
 std::string Steady(std::string text) {
   text = std::regex_replace(text, std::regex("[0-9]+ ms"), "N ms");
   text = std::regex_replace(text, std::regex("[0-9]+ days? (left|ago)"), "N days $1");
@@ -73,7 +73,7 @@ Result DoctorOf(const ScriptedServer &server, const std::string &more = {}) {
                   TlsPath("authority.crt") + " " + more);
 }
 
-/// The lines of one check, without the names of the columns before them.
+/// The lines of one check, without the column of its name.
 std::string LinesOf(const std::string &text, const std::string &check) {
   std::string lines;
   bool isIn = false;
@@ -155,7 +155,7 @@ TEST(DoctorRequest, ContainsNothingFromTheEnvironmentOrTheStandardInput) {
                                    port + "/sts --ca " + TlsPath("authority.crt") + " --trust holder.crt");
     EXPECT_EQ(8, result.exitCode) << result.err;
     EXPECT_THAT(result.out + result.err, Not(HasSubstr("canary")));
-    EXPECT_EQ(2, server.GetConnectionCount()); // one for the handshake alone, and one for the request
+    EXPECT_EQ(2, server.GetConnectionCount()); // one only for the handshake, and one for the request
   }
   EXPECT_THAT(received, StartsWith("POST /sts HTTP/1.1\r\n"));
   EXPECT_THAT(received, testing::EndsWith("</soapenv:Envelope>"));
@@ -201,7 +201,7 @@ TEST_F(Doctor, RecognisesEachWrongAnswerOfAService) {
   EXPECT_THAT(Check(oversize, "http"), HasSubstr("the body is longer than 16777216 bytes"));
 }
 
-TEST(DoctorTls, NamesEachReasonForWhichAServerIsRefusedAndSendsNothing) {
+TEST(DoctorTls, ShowsEachReasonToRefuseAServerAndSendsNothing) {
   struct Case {
     std::string certificate;
     std::string reason;

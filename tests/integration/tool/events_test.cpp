@@ -1,5 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
-// With -v, each command that calls the service shows what it sends and gets, and no secret.
+// With -v, each command that calls the service shows what it sends and receives, and no secret.
 
 #include "closed_port.h"
 #include "process.h"

@@ -1,5 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
-// `verify --explain` shows each check of a token, and ends as `verify` does.
+// `verify --explain` shows each check of a token, and ends like `verify`.
 
 #include "expect_result.h"
 #include "expected_output.h"
@@ -63,7 +63,7 @@ struct Refused {
   int exitCode;
 };
 
-TEST(VerifyExplain, EndsAsVerifyDoesAndReportsTheSameRefusal) {
+TEST(VerifyExplain, EndsLikeVerifyAndReportsTheSameRefusal) {
   for (const Refused &refused :
        {Refused{"expired.xml", 5}, Refused{"early.xml", 5}, Refused{"signed-by-other.xml", 6},
         Refused{"sts-rsa.crt", 5}, Refused{"../attacks/other-root.xml", 5}, Refused{"../foreign/saml2.xml", 5},
@@ -95,7 +95,7 @@ TEST(VerifyExplain, ShowsAnAcceptedTokenAsJson) {
   EXPECT_EQ(true, report["references"].at(0)["coversToken"]);
 }
 
-TEST(VerifyExplain, OfARefusedTokenHasNothingThatATokenSaysInTheKeysOfAToken) {
+TEST(VerifyExplain, ShowsNoFactOfARefusedTokenInJson) {
   const Result result = RunTool(Explain("expired.xml", {"--format", "json"}));
   const ordered_json json = ordered_json::parse(result.out);
   EXPECT_EQ(17u, json.size());
@@ -105,7 +105,7 @@ TEST(VerifyExplain, OfARefusedTokenHasNothingThatATokenSaysInTheKeysOfAToken) {
   }
 }
 
-TEST(VerifyExplain, NamesAForeignCertificateThatTheTokenBringsAlong) {
+TEST(VerifyExplain, ShowsAForeignCertificateInTheToken) {
   const Result result = RunTool(Explain("../attacks/foreign-certificate.xml", {"--format", "json"}));
   EXPECT_EQ(6, result.exitCode);
   const ordered_json report = ordered_json::parse(result.out)["report"];
@@ -123,7 +123,7 @@ TEST(VerifyExplain, IsPlainInAPipe) {
               Not(HasSubstr("\033")));
 }
 
-TEST(VerifyExplain, IsAsWideAsColumnsSays) {
+TEST(VerifyExplain, UsesTheWidthInColumns) {
   const auto widest = [](const std::string &columns) {
     std::istringstream lines(
         RunShell(columns + " ssoclient verify --explain --trust sts-rsa.crt ../foreign/saml2.xml").out);
@@ -156,7 +156,7 @@ TEST(VerifyExplain, IsColouredAtATerminal) {
   EXPECT_THAT(shown, HasSubstr("\033[32mpassed\033[0m"));
 }
 
-TEST(VerifyExplain, IsPlainAtATerminalThatWantsNoColour) {
+TEST(VerifyExplain, IsPlainWhenNoColorIsSetOrTheTerminalIsDumb) {
   EXPECT_THAT(AtATerminal("NO_COLOR=1 TERM=xterm"), Not(HasSubstr("\033")));
   EXPECT_THAT(AtATerminal("unset NO_COLOR; TERM=dumb"), Not(HasSubstr("\033")));
   EXPECT_THAT(AtATerminal("NO_COLOR= TERM=xterm"), HasSubstr("\033[31mfailed"));
@@ -194,7 +194,7 @@ TEST(VerifyDemands, RefuseAnotherConfirmation) {
   EXPECT_EQ(0, RunTool({"verify", "--trust", "sts-rsa.crt", "full.xml", "--require", "holder-of-key"}).exitCode);
 }
 
-TEST(VerifyDemands, KnowTwoConfirmations) {
+TEST(VerifyDemands, RefuseAnUnknownConfirmation) {
   ExpectResult(RunTool({"verify", "--trust", "sts-rsa.crt", "bearer.xml", "--require", "none"}), 2, "",
                "ssoclient: usage: --require: none not in {bearer,holder-of-key}; see ssoclient --help\n");
 }

@@ -1,5 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
-// `inspect` shows whatever a well-formed document with an assertion in it holds, and what deviates from the accepted form.
+// `inspect` shows what the first assertion in a well-formed document says, and what deviates from the accepted form.
 
 #include "expect_result.h"
 #include "expected_output.h"
@@ -91,7 +91,7 @@ TEST(Inspect, ShowsTokensThatWouldBeRefusedForDatesOrSignature) {
   }
 }
 
-TEST(Inspect, SaysByHowMuchAClockMisses) {
+TEST(Inspect, ShowsByHowMuchTheClockMissesTheEnd) {
   const ordered_json report = InspectJson("expired.xml")["report"];
   EXPECT_EQ("The token has expired at: 2021-01-01T00:00:00.000Z", report["refusal"]);
   const ordered_json finding = CheckIn(report, "validity")["findings"].at(0);
@@ -140,7 +140,7 @@ TEST(Inspect, ShowsATokenOfAnotherFormAndWhatDeviates) {
               StartsWith("Element 'saml:NameID' must only have textual content"));
 }
 
-/// What is known of the assertion of another maker's service, alone or in a message.
+/// Expects the facts of an assertion of another maker's service, by itself or in a message.
 void ExpectForeignToken(const ordered_json &json) {
   EXPECT_EQ(false, json["verified"]);
   EXPECT_EQ("_0f2b6d4e-7a31-4c58-9e0d-5b1c2a3f4e6d", json["id"]);
@@ -173,7 +173,7 @@ TEST(Inspect, ShowsAnAssertionWithinAMessage) {
   ExpectForeignToken(InspectJson("../foreign/in-envelope.xml"));
 }
 
-TEST(Inspect, NamesThePlaceOfEachDeviation) {
+TEST(Inspect, ShowsThePlaceOfEachDeviation) {
   const ordered_json form = CheckIn(InspectJson("../foreign/saml2.xml")["report"], "form");
   std::vector<std::string> paths;
   for (const auto &finding : form["findings"]) {
@@ -185,7 +185,7 @@ TEST(Inspect, NamesThePlaceOfEachDeviation) {
   EXPECT_THAT(paths, testing::IsSupersetOf({"/saml2:Assertion"}));
 }
 
-TEST(Inspect, ShowsUnknownForWhatAForeignTokenDoesNotSay) {
+TEST(Inspect, ShowsUnknownForFactsThatAForeignTokenLacks) {
   const Result result = RunTool({"inspect", "../foreign/saml2.xml"});
   EXPECT_EQ(0, result.exitCode);
   EXPECT_THAT(result.out, HasSubstr("\nSubject:         unknown\n"));
@@ -244,7 +244,7 @@ TEST(Inspect, EscapesControlCharacters) {
   EXPECT_TRUE(IsAscii(json.out));
 }
 
-TEST(Inspect, EscapesHostileNamesAndValuesInWhatDeviates) {
+TEST(Inspect, EscapesHostileNamesAndValuesOfDeviations) {
   std::string token = ReadDataFile("foreign/saml2.xml");
   const std::string version = "Version=\"2.0\"";
   token.replace(token.find(version), version.size(),

@@ -15,7 +15,7 @@ constexpr const char *EXPLAIN_HINT = "ssoclient verify --explain shows each chec
 constexpr const char *SAVE_HINT =
     "--save-refused FILE keeps the refused token; ssoclient verify --explain then shows each check of it";
 
-/// Whether a failure of this class is about a token, if the tool verified a token before it failed.
+/// Whether a failure of this class refuses a token, if it occurs while the tool verifies one.
 inline bool IsAboutToken(const std::string &exceptionClass) {
   return exceptionClass == "ParseException" || exceptionClass == "XMLParseException" ||
          exceptionClass == "InvalidSignatureException";

@@ -39,7 +39,7 @@ protected:
 
 constexpr auto OWNER_ALONE = std::filesystem::perms::owner_read | std::filesystem::perms::owner_write;
 
-TEST_F(SaveRefused, KeepsTheTokenForItsOwnerAlone) {
+TEST_F(SaveRefused, KeepsTheTokenForItsOwnerOnly) {
   const Result result = Run("umask 0; " + Line());
   ExpectResult(result, 6, "",
                std::string("ssoclient: ") + PLACE + "\n" + RefusalText("signature invalid", TAMPERED, SavedHint()));
@@ -52,7 +52,7 @@ TEST_F(SaveRefused, WritesOnlyTheFailureInJson) {
   EXPECT_EQ(1u, m_folder.Names().count("refused.xml"));
 }
 
-TEST_F(SaveRefused, KeepsWhatVerifyThenExplains) {
+TEST_F(SaveRefused, KeepsATokenThatVerifyExplains) {
   EXPECT_EQ(6, Run(Line()).exitCode);
   const Result result = Run("ssoclient verify --explain --trust sts.pem refused.xml");
   EXPECT_EQ(6, result.exitCode);
@@ -116,8 +116,8 @@ TEST_F(SaveRefused, WritesNoFileWhenNoTokenIsRefused) {
   EXPECT_EQ(0u, m_folder.Names().count("refused.xml"));
 }
 
-TEST_F(SaveRefused, IsAWarningWhenTheFileCannotBeWritten) {
-  // The effect of a limit of file sizes is that of a full disk. The signal that it sends is ignored.
+TEST_F(SaveRefused, WarnsWhenTheFileCannotBeWritten) {
+  // A limit of file sizes has the same effect as a full disk. Its signal is ignored.
   const std::string limited = "trap '' XFSZ; ulimit -f 0; " + Line();
   const std::string problem = "the refused token could not be saved: refused.xml: File too large";
   ExpectResult(Run(limited), 6, "",

@@ -134,7 +134,7 @@ TEST(HttpsSession, ReportsCodeAndReasonOfEveryOtherStatus) {
   }
 }
 
-/// The facts that a session notes of a response, as text. The outcome does not matter.
+/// The facts that a session records about a response, as text. The outcome does not matter.
 std::string FactsOf(const std::string &response) {
   ServiceStandIn service(AnswerWith(response));
   Request request = SampleRequest();
@@ -150,7 +150,7 @@ TEST(HttpsSession, NotesTheFactsOfAResponse) {
   EXPECT_EQ(FactsOf(Response("500 Internal Server Error", "<fault/>")), "500 Internal Server Error, , 8");
   EXPECT_EQ(FactsOf("HTTP/1.1 200 OK\r\nTransfer-Encoding: chunked\r\n\r\n3\r\nabc\r\n2\r\nde\r\n0\r\n\r\n"),
             "200 OK, , 5");
-  // The length is that of the body as it was received; as UTF-8 this one is longer.
+  // The length is that of the body as received. In UTF-8, this body is longer.
   EXPECT_EQ(FactsOf(Response("200 OK", "\xFC\xFC", "Content-Type: text/xml;charset=latin1\r\n")),
             "200 OK, text/xml;charset=latin1, 2");
 }
@@ -159,7 +159,7 @@ TEST(HttpsSession, NotesTheFactsOfAnErrorStatus) {
   EXPECT_EQ(FactsOf(Response("503 Busy", "<html/>", "Content-Type: text/html\r\n")), "503 Busy, text/html, 0");
 }
 
-TEST(HttpsSession, NotesNothingWithoutResponse) {
+TEST(HttpsSession, NotesNoFactsWithoutAResponse) {
   EXPECT_EQ(FactsOf("garbage"), "0 , , 0");
   EXPECT_EQ(FactsOf("HTTP/1.1 200 OK\r\nContent-Length: 100\r\n\r\nshort"), "0 , , 0");
 }

@@ -26,7 +26,7 @@ constexpr std::size_t MAX_PROBED_REFUSALS = 100;    ///< of a handshake; a probe
 struct ServerRefusal {
   /// The kinds of reasons.
   enum class Kind : std::int32_t {
-    OTHER = 0,       ///< a reason that has no kind of its own
+    OTHER = 0,       ///< any other reason
     EXPIRED,         ///< a certificate is no longer valid
     NOT_YET_VALID,   ///< a certificate is not valid yet
     OTHER_NAME,      ///< the server's certificate is for other names
@@ -42,8 +42,8 @@ struct ServerRefusal {
   std::string text;        ///< in the words of an `SSLException`, without the endpoint
   std::size_t depth = 0;   ///< of the certificate in the chain that was verified; 0 is the server's
 
-  /// The certificate at that depth, which need not be one of those that the server sent. Null if it cannot be read, and
-  /// for `OTHER_THUMBPRINT`.
+  /// The certificate at that depth, which need not be one of those that the server sent. Null for one that cannot be
+  /// read, and for `OTHER_THUMBPRINT`.
   Ref<const Crypto::Certificate> certificate;
 };
 
@@ -76,7 +76,7 @@ struct HandshakeProbe {
   /// the chain.
   Ref<const Crypto::Certificate> anchor;
 
-  /// The reasons to refuse the server, in the order in which they were found. `failure` contains the first.
+  /// Every reason, in the order in which they were found. `failure` reports the first one.
   std::vector<ServerRefusal> refusals;
 };
 
@@ -109,8 +109,8 @@ struct ServerProbe {
 
 /// Looks up `host`, connects to each of its addresses, and performs a TLS handshake with the first that answers. The
 /// same code as for every other connection decides whether the server is accepted, but here it continues after the
-/// first reason to refuse a certificate, and records each. The connection is closed after the handshake, whether or not
-/// the server was accepted; nothing else is sent. No session is resumed. The call blocks the thread, which must not be
+/// first reason against a certificate, and records each. The connection is closed after the handshake, whether or not
+/// the server was accepted; nothing else is sent. No session is resumed. Blocks the calling thread, which must not be
 /// an I/O thread.
 /// @param host as in `System::TcpClientSocket::AsyncConnect`.
 /// @param port 1 to 65535.
