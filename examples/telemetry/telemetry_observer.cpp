@@ -100,8 +100,8 @@ void TelemetryObserver::OnResponseReceived(const OperationInfo &operation,
   }
   const std::lock_guard<std::mutex> lock(m_mutex);
   Trace &trace = m_traces.at(operation.id);
-  if (trace.exchanges.empty()) {
-    return; // there was no memory for the span
+  if (trace.exchanges.empty() || trace.exchanges.back().end != system_clock::time_point()) {
+    return; // there was no memory for the span of this exchange
   }
   Span &span = trace.exchanges.back();
   span.end = span.start + microseconds(event.durationMicroseconds);

@@ -34,12 +34,14 @@ void CheckDates(const Certificate &certificate, const CertificateFile &file, con
   }
   check.found.push_back(NameOf(certificate, file) + " " + (isEarly || days < 0 ? "" : "has ") +
                         LeftText(certificate, now) + ".");
+  const std::string get =
+      isEarly ? "Correct this machine's clock if it is wrong. If it is right, get the " : "Get the ";
+  const std::string next = isEarly ? "present certificate" : "next certificate";
   if (file.isAuthority) {
-    check.Warn(
-        "Get the authority's next certificate, and give it with --ca: a server is accepted only while this one is "
-        "valid.");
+    check.Warn(get + "authority's " + next +
+               ", and give it with --ca: a server is accepted only while this one is valid.");
   } else {
-    check.Warn("Get the service's next certificate, and give it with --trust. The key of this one stays trusted.");
+    check.Warn(get + "service's " + next + ", and give it with --trust. The key of this one stays trusted.");
   }
 }
 

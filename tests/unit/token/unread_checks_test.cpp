@@ -90,7 +90,7 @@ TEST_F(UnreadChecks, ADelegateThatCannotBeReadIsReportedOnce) {
   const TokenReport report = Explain(Changed(delegate, "<x/></saml:NameID></del:Delegate>", "delegated"));
   EXPECT_EQ("form failed, delegation not done", NotPassed(report));
   EXPECT_EQ("The last delegate of the delegation restriction cannot be read.", report.Get(Check::DELEGATION).summary);
-  EXPECT_EQ("backup@corp.example", ReplaceOnce(delegate, "</saml:NameID></del:Delegate>", ""));
+  EXPECT_EQ(1u, report.Get(Check::FORM).findings.size());
 }
 
 TEST_F(UnreadChecks, AMissingIdIsNotReportedAgainAsAWrongId) {

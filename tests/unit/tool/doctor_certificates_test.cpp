@@ -64,8 +64,14 @@ TEST(CheckCertificates, WarnsOfACertificateThatHasEnded) {
 }
 
 TEST(CheckCertificates, WarnsOfACertificateThatIsNotValidYet) {
-  EXPECT_THAT(Check({Trust("tls/not-yet-valid")}).found,
-              ElementsAre("1 certificate.", "CN=not-yet-valid of sts.pem becomes valid in 30679 days."));
+  const DoctorCheck trusted = Check({Trust("tls/not-yet-valid")});
+  EXPECT_THAT(trusted.found, ElementsAre("1 certificate.", "CN=not-yet-valid of sts.pem becomes valid in 30679 days."));
+  EXPECT_THAT(trusted.todo, ElementsAre("Correct this machine's clock if it is wrong. If it is right, get the "
+                                        "service's present certificate, and give it with --trust. The key of this one "
+                                        "stays trusted."));
+  EXPECT_THAT(Check({Authority("tls/not-yet-valid")}).todo,
+              ElementsAre("Correct this machine's clock if it is wrong. If it is right, get the authority's present "
+                          "certificate, and give it with --ca: a server is accepted only while this one is valid."));
 }
 
 TEST(CheckCertificates, WarnsOfACertificateThatEndsWithin30Days) {
