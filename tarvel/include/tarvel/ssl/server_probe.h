@@ -103,7 +103,7 @@ struct ServerProbe {
   std::size_t addressCount = 0;        ///< how many addresses the name has, including those that were not tried
   std::vector<AddressProbe> addresses; ///< in the order in which a connection tries them
 
-  /// The handshake with the first of `addresses` that answered; `boost::none` when none answered, and without a context.
+  /// The handshake with the first of `addresses` that answered; `boost::none` if none answered, and without a context.
   boost::optional<HandshakeProbe> handshake;
 };
 
