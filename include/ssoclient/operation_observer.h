@@ -62,8 +62,9 @@ struct OperationEndedEvent {
 /// because the operation waits for them. They must not throw: what they throw is written to the log (logger
 /// "SsoClient", level 8) and changes nothing else.
 ///
-/// The events of one operation arrive in this order: started; for each message request sent, response received, and a
-/// fault if the response is one; ended. There is exactly one "ended" for each "started", also after a failure.
+/// The events of one operation arrive in this order: "started"; for each message "request sent", "response received",
+/// and "fault" if the response is a fault; "ended". There is exactly one "ended" for each "started", also after a
+/// failure.
 ///
 /// No event contains a secret: no password, no text of a token, no value of a signature. If the service repeats the
 /// operation's password in a fault, "***" is in its place. Names of persons may occur in the texts of a service.

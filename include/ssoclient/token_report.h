@@ -152,7 +152,7 @@ struct TokenReport {
   std::string refusal;
   std::vector<CheckResult> checks;                 ///< all checks, in order
   std::string signatureAlgorithm;                  ///< its URI; empty if there is no signature that can be read
-  std::string canonicalization;                    ///< the algorithm's URI for `SignedInfo`; empty in the same case
+  std::string canonicalization;                    ///< the URI of the algorithm of `SignedInfo`; empty in that case
   std::vector<Reference> references;               ///< at most ten
   std::vector<TrustedKey> trustedKeys;             ///< in the order in which they are trusted
   std::vector<NamedCertificate> namedCertificates; ///< at most 16

@@ -20,8 +20,7 @@ using Tarvel::Xml::TextNode;
 
 constexpr std::string_view WHITE_SPACE = " \t\r\n";
 
-/// The names of elements with content that is never shown. Names that begin with "Signature" are treated in the same
-/// way.
+/// The names of elements with content that is never shown. Names that begin with "Signature" are secret, too.
 constexpr std::string_view SECRET_ELEMENTS[] = {"Assertion",    "EncryptedData",       "EncryptedAssertion",
                                                 "CipherValue",  "BinarySecurityToken", "BinaryExchange",
                                                 "BinarySecret", "DigestValue",         "Password"};

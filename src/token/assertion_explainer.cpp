@@ -51,7 +51,7 @@ public:
     ExplainSignature(assertion.Signature.get(), *assertion.element, resolver, m_report, m_recorder);
   }
 
-  /// The checks after those of the signature. They move texts out of the assertion.
+  /// The checks after those of the signature. They move values out of the assertion.
   void ExplainFacts() {
     SetClaims(m_read, m_report.claims);
     TokenFacts facts = ExplainNames();

@@ -17,8 +17,8 @@ namespace SsoClient {
 ///
 /// A path takes bounded time and memory in every document. If more than `MAX_SIBLINGS` nodes are before an element,
 /// "[?]" is written after its name. If the path of its parent is longer than `MAX_PARENT_BYTES`, "/..." is written
-/// instead of that path. The paths of parents are kept. A path contains the sender's names, so it need not be
-/// printable. The tree must outlive this object, and must not be changed.
+/// instead of that path. The paths of parents are kept for later calls. A path contains the sender's names, so it need
+/// not be printable. The tree must outlive this object, and must not be changed.
 class ElementPaths {
 public:
   static constexpr unsigned MAX_SIBLINGS = 1000;

@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// `ReadAssertion`, an assertion with the knowledge which of its parts could be read.
+/// `ReadAssertion`, the parts of an assertion that could be read.
 
 #pragma once
 

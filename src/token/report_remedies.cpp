@@ -49,8 +49,7 @@ const NamedCertificate *FindStranger(const TokenReport &report) {
   return stranger == report.namedCertificates.end() ? nullptr : &*stranger;
 }
 
-/// Asks for the issuer's certificate. The certificate in the signature is only a hint, because anyone can put one
-/// there.
+/// Asks for the issuer's certificate. A certificate in the signature is only a hint, because any sender can add one.
 std::string ForMissingKey(const TokenReport &report) {
   const NamedCertificate *const stranger = FindStranger(report);
   std::string remedy = "Give the certificate of the service that issued the token";

@@ -46,7 +46,7 @@ struct TokenFacts {
 TokenFacts TakeTokenFacts(SamlAssertionType &&assertion);
 
 /// The steps of `TakeTokenFacts`, in their order. What cannot be read is reported to `sink`, and left out if the sink
-/// does not throw. They move texts out of `assertion`.
+/// does not throw. They move values out of their first argument.
 void TakeSubject(SamlAssertionType &assertion, TokenFacts &facts, DeviationSink &sink);
 void TakeAttributes(SamlAssertionType &assertion, TokenFacts &facts, DeviationSink &sink);
 void TakeConditions(ConditionsType &conditions, TokenFacts &facts, DeviationSink &sink);

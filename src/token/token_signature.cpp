@@ -24,7 +24,7 @@ using Tarvel::Xml::Security::Signature;
 
 constexpr ElementOfName EXPECTED{{Namespaces::DS, "Signature"}};
 
-/// The targets of the signature's references, as text on demand.
+/// The URIs of the signature's references. They become a text only if it is needed.
 struct UrisOf {
   const Signature *signature;
 };

@@ -1,6 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// What the accepted form allows at a place, and what is there, as arguments of `Refuse`: they become texts on demand.
+/// Arguments of `Refuse` for what the accepted form allows at a place, and for what is there. They become texts only if
+/// the texts are needed.
 ///
 /// Names in namespaces that the form uses are written with the usual prefix, such as "saml:Conditions", even if the
 /// document has another prefix. `WhatIsAt` writes names as they are in the document.

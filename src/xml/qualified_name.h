@@ -50,7 +50,7 @@ QNameView ResolveQName(const Tarvel::Xml::ElementNode &element, std::string_view
 
 /// The same for the name or the value of an attribute of `element`. A prefix that is not bound is reported to `sink`.
 /// @param attributeName the place that is reported.
-/// @return nothing if the prefix is not bound.
+/// @return nullopt if the prefix is not bound.
 std::optional<QNameView> ResolveQName(const Tarvel::Xml::ElementNode &element, std::string_view attributeName,
                                       std::string_view text, std::string_view defaultNamespace, DeviationSink &sink);
 
@@ -65,13 +65,13 @@ bool ElementQNameIs(const Tarvel::Xml::ElementNode *element, std::string_view lo
                     std::string_view namespaceUri) noexcept;
 
 /// Whether `element` has an `xsi:type` whose value is `type`. A value without a prefix is in the default namespace. If the
-/// type's prefix is not bound, that is reported, and the answer is no.
+/// type's prefix is not bound, that is reported, and the result is false.
 bool ElementXsiTypeIs(const Tarvel::Xml::ElementNode &element, const QNameView &type,
                       DeviationSink &sink = ThrowingSink());
 
 /// Reads the value of `attribute`, an `xsi:type` of `element`, as a name. A name without a prefix is in the default
 /// namespace. A prefix that is not bound is reported.
-/// @return a view into the tree, or nothing if the prefix is not bound.
+/// @return a view into the tree, or nullopt if the prefix is not bound.
 std::optional<QNameView> ResolveXsiType(const Tarvel::Xml::ElementNode &element,
                                         const Tarvel::Xml::Attribute &attribute, DeviationSink &sink);
 

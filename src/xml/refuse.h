@@ -38,7 +38,7 @@ struct Place {
 /// allows at `place`, and `found`, which is shortened, is what is there. Returns only if the sink does not throw.
 ///
 /// `allowed`, `found` and `args` may be of any type that `Tarvel::MessageFormatter` accepts. They become texts only if the
-/// sink is not full, so a rule should pass its values, not texts that it has made of them.
+/// sink is not full, so a rule should pass values, and not compose texts from them.
 template <typename Allowed, typename Found, typename... Args>
 void Refuse(DeviationSink &sink, const Place &place, const Allowed &allowed, const Found &found,
             std::string_view format, const Args &...args) {

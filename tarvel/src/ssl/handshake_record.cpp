@@ -101,7 +101,7 @@ void HandshakeRecord::NoteChain(X509_STORE_CTX *verification) {
 void HandshakeRecord::NoteAnchor(X509_STORE_CTX *verification) {
   const STACK_OF(X509) *const chain = X509_STORE_CTX_get0_chain(verification);
   const int length = sk_X509_num(chain);
-  // This number of certificates at the beginning are the server's, and the others are from the trust store.
+  // The server sent this number of certificates at the beginning of the chain; the others are from the trust store.
   if (length > 0 && X509_STORE_CTX_get_num_untrusted(verification) < length) {
     m_probe.anchor = Copy(sk_X509_value(chain, length - 1));
   }

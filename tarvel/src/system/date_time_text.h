@@ -23,7 +23,7 @@ struct DateTimeFields {
   std::int32_t biasMinutes; ///< minutes east of UTC, -840 to 840
 };
 
-/// Why a text is not a date-time. It contains no text that must be composed, so it is cheap if the reason is not shown.
+/// Why a text is not a date-time. The message is composed only when an exception is thrown.
 struct DateTimeRefusal {
   const char *reason = nullptr; ///< null if the text is not refused
   std::size_t character = 0;    ///< from 1; 0 if the reason is not about a character

@@ -90,10 +90,10 @@ struct AddressProbe {
     FAILED        ///< any other failure
   };
 
-  std::string address;                   ///< IPv4 or IPv6, without brackets
-  Outcome outcome = Outcome::FAILED;     ///< how it ended
-  std::string reason;                    ///< the system's text; empty if the address answered
-  std::int64_t durationMicroseconds = 0; ///< how long it took
+  std::string address; ///< IPv4 or IPv6, without brackets
+  Outcome outcome = Outcome::FAILED;
+  std::string reason; ///< why no connection was made, as text; empty if the address answered
+  std::int64_t durationMicroseconds = 0;
 };
 
 /// What `ProbeServer` has found.
@@ -103,14 +103,14 @@ struct ServerProbe {
   std::size_t addressCount = 0;        ///< how many addresses the name has, also those that were not tried
   std::vector<AddressProbe> addresses; ///< in the order in which a connection tries them
 
-  /// The handshake with the first address that answered; `boost::none` when none answered, and without a context.
+  /// The handshake with the first of `addresses` that answered; `boost::none` if none answered, and without a context.
   boost::optional<HandshakeProbe> handshake;
 };
 
-/// Looks up `host`, connects to each of its addresses, and performs a TLS handshake with the first that answers. The
-/// same code as for every other connection decides whether the server is accepted, but here it continues after the
-/// first reason against a certificate, and records each. The connection is closed after the handshake, whether or not
-/// the server was accepted; nothing else is sent. No session is resumed. Blocks the calling thread, which must not be
+/// Looks up `host`, connects to its addresses, and performs a TLS handshake with the first in the list that answered.
+/// The same code as for every other connection decides whether the server is accepted, but here it continues after the
+/// first reason to refuse a certificate, and records each. The connection is closed after the handshake, whether or not
+/// the server was accepted; nothing else is sent. No session is resumed. The call blocks the thread, which must not be
 /// an I/O thread.
 /// @param host as in `System::TcpClientSocket::AsyncConnect`.
 /// @param port 1 to 65535.

@@ -35,7 +35,7 @@ public:
   /// @throws DateTimeFormatException when the text has another form or a field is out of range.
   explicit DateTime(std::string_view text);
 
-  /// The same without an exception, for programs that read many texts that may have another form.
+  /// The same without an exception, for programs that read many texts, some of which have another form.
   /// @return whether `text` is a date-time; `date` is set only then.
   static bool TryParse(std::string_view text, DateTime &date) noexcept;
 

@@ -23,7 +23,8 @@ std::vector<std::uint8_t> DecodeCertificateText(std::string_view text);
 /// What a report says about a certificate. `isTrusted` is false.
 SignatureReport::NamedCertificate DescribeCertificate(const Crypto::Certificate &certificate);
 
-/// What a report says about octets that a message has in place of a certificate. More than 64 KiB are not decoded.
+/// What a report says about a certificate that is not trusted. `der` may be any octets; more than 64 KiB are not
+/// decoded.
 SignatureReport::NamedCertificate DescribeStranger(const std::vector<std::uint8_t> &der);
 
 /// The certificates in their order, without nulls and duplicates.

@@ -11,7 +11,7 @@
 
 namespace Tarvel::Xml::Security {
 
-/// `Signature::Explain`.
+/// Implements `Signature::Explain` for `signature`.
 SignatureReport ExplainSignature(const SignatureInTree &signature, const KeyInfoResolver &resolver);
 
 } // namespace Tarvel::Xml::Security
