@@ -3,6 +3,7 @@
 #include "exchange/soap_fault.h"
 
 #include "model/namespaces.h"
+#include "xml/tree_walk.h"
 #include "xml/xml_text.h"
 
 #include <algorithm>
@@ -41,18 +42,6 @@ std::string_view NamespaceOf(const ElementNode *element, std::string_view code) 
   return namespaceUri;
 }
 
-/// The node after `node` in document order within `top`; null after the last one. The nodes below `node` are skipped
-/// unless `enters`.
-const Node *NextNode(const Node *node, const Node *top, bool enters) noexcept {
-  if (enters && node->GetFirstChild()) {
-    return node->GetFirstChild();
-  }
-  while (node != top && !node->GetNextSibling()) {
-    node = node->GetParent();
-  }
-  return node == top ? nullptr : node->GetNextSibling();
-}
-
 std::string_view Trim(std::string_view text) noexcept {
   const std::size_t first = text.find_first_not_of(WHITE_SPACE);
   return first == std::string_view::npos ? std::string_view()
@@ -70,7 +59,7 @@ std::string ShownTexts(const ElementNode &element) {
     if (!value.empty()) {
       texts.append(texts.empty() ? "" : " ").append(value);
     }
-    node = NextNode(node, &element, inner && !IsSecretElement(inner->GetLocalName()));
+    node = NextInTree(node, &element, inner && !IsSecretElement(inner->GetLocalName()));
   }
   return texts;
 }

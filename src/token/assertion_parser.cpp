@@ -9,6 +9,7 @@
 #include "token/token_signature.h"
 #include "xml/qualified_name.h"
 #include "xml/strict_checks.h"
+#include "xml/tree_walk.h"
 
 namespace SsoClient {
 
@@ -17,21 +18,10 @@ namespace {
 using Tarvel::Xml::ElementNode;
 using Tarvel::Xml::Node;
 
-/// The node after `node` in document order, if it is below `top`; otherwise null.
-const Node *NextBelow(const Node *node, const Node *top) {
-  if (node->GetFirstChild()) {
-    return node->GetFirstChild();
-  }
-  while (node != top && !node->GetNextSibling()) {
-    node = node->GetParent();
-  }
-  return node == top ? nullptr : node->GetNextSibling();
-}
-
 /// The first SAML 2.0 assertion in the tree of `top` or, if there is none, the first "Assertion" in any namespace.
 const ElementNode *FindAssertion(const Node *top) {
   const ElementNode *inOtherNamespace = nullptr;
-  for (const Node *node = top; node; node = NextBelow(node, top)) {
+  for (const Node *node = top; node; node = NextInTree(node, top)) {
     const ElementNode *const element = Tarvel::Xml::AsElement(node);
     if (ElementQNameIs(element, "Assertion", Namespaces::SAML)) {
       return element;
