@@ -20,6 +20,10 @@ using Kind = ServerRefusal::Kind;
 constexpr std::size_t MAX_SHOWN_NAMES = 10;
 constexpr std::size_t MAX_SHOWN_REASONS = 10;
 
+/// --thumbprint takes the digest of the server's own certificate only.
+constexpr const char *AUTHORITY_ADVICE =
+    "Give this authority's certificate with --ca, after you have compared it in another way.";
+
 struct KindRow {
   Kind kind;
   const char *name;
@@ -49,6 +53,10 @@ constexpr KindRow KINDS[] = {
 
 const KindRow &RowOf(Kind kind) {
   return *std::find_if(std::begin(KINDS), std::end(KINDS) - 1, [kind](const KindRow &row) { return row.kind == kind; });
+}
+
+const char *AdviceFor(const ServerRefusal &refusal) {
+  return refusal.kind == Kind::SELF_SIGNED && refusal.depth > 0 ? AUTHORITY_ADVICE : RowOf(refusal.kind).advice;
 }
 
 std::string DescribeNames(const DoctorTarget &target, const Certificate &certificate) {
@@ -121,7 +129,7 @@ void DescribeRefusals(const DoctorTarget &target, const HandshakeProbe &handshak
       break;
     }
     check.found.push_back(Describe(target, refusal, now));
-    AddOnce(advice, RowOf(refusal.kind).advice);
+    AddOnce(advice, AdviceFor(refusal));
   }
   for (const std::string &text : advice) {
     check.Fail(ExitCode::COMMUNICATION, text);

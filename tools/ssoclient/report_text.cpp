@@ -100,12 +100,13 @@ void AddReference(const TokenReport::Reference &reference, LabelledLines &lines)
   }
 }
 
-void AddKey(const TokenReport::TrustedKey &key, LabelledLines &lines) {
+void AddKey(const TokenReport::TrustedKey &key, bool hasAlgorithm, LabelledLines &lines) {
   lines.Add("Trusted key:", key.subject);
   lines.Add("", "SHA-256 " + key.thumbprint);
   lines.Add("", key.madeSignature ? "made the signature"
                 : key.isUsable    ? "did not make the signature"
-                                  : "cannot be used with the signature's algorithm");
+                : hasAlgorithm    ? "cannot be used with the signature's algorithm"
+                                  : "was not tried, because the signature's algorithm is not known");
 }
 
 void AddNamedCertificate(const TokenReport::NamedCertificate &certificate, bool usesTrust, LabelledLines &lines) {
@@ -139,7 +140,7 @@ std::string ReportText(const ReportView &view, const TextStyle &style) {
     AddReference(reference, lines);
   }
   for (const TokenReport::TrustedKey &key : report.trustedKeys) {
-    AddKey(key, lines);
+    AddKey(key, !report.signatureAlgorithm.empty(), lines);
   }
   for (const TokenReport::NamedCertificate &certificate : report.namedCertificates) {
     AddNamedCertificate(certificate, view.usesTrust, lines);

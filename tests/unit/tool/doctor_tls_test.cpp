@@ -115,6 +115,17 @@ TEST(CheckTls, DescribesTheOtherReasons) {
   }
 }
 
+TEST(CheckTls, AdvisesAThumbprintOnlyForTheServersOwnCertificate) {
+  HandshakeProbe handshake = Refused("self-signed", {Kind::SELF_SIGNED});
+  EXPECT_EQ(std::vector<std::string>{"Give this certificate with --ca, or its thumbprint with --thumbprint, after you "
+                                     "have compared it in another way."},
+            Check(handshake).todo);
+  handshake.refusals[0].depth = 1;
+  EXPECT_EQ(std::vector<std::string>{"Give this authority's certificate with --ca, after you have compared it in "
+                                     "another way."},
+            Check(handshake).todo);
+}
+
 TEST(CheckTls, GivesTheSameAdviceOnlyOnceAndCutsTheListOfReasons) {
   const DoctorCheck check = Check(Refused("expired", std::vector<Kind>(99, Kind::EXPIRED)));
   EXPECT_EQ(1u, check.todo.size());

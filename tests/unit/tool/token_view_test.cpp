@@ -305,6 +305,18 @@ TEST(ReportText, HasColoursOnlyForOutcomesAndOnlyIfAsked) {
   EXPECT_THAT(ReportText({report}, PLAIN), Not(HasSubstr("\033")));
 }
 
+TEST(ReportText, DoesNotBlameAKeyForASignatureThatIsNotThere) {
+  TokenReport report = Passed();
+  report.signatureAlgorithm.clear();
+  report.trustedKeys.resize(1);
+  report.trustedKeys[0].subject = "CN=sts";
+  report.trustedKeys[0].thumbprint = "ab";
+  EXPECT_THAT(ReportText({report}, PLAIN),
+              HasSubstr("Trusted key:     CN=sts\n"
+                        "                 SHA-256 ab\n"
+                        "                 was not tried, because the signature's algorithm is not known\n"));
+}
+
 TEST(ReportText, ShowsReferencesKeysAndNamedCertificates) {
   TokenReport report = Passed();
   report.signatureAlgorithm = "urn:algorithm";
