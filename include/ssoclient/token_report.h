@@ -159,10 +159,16 @@ struct TokenReport {
 
   /// The result of `check`, which every report of `TokenVerifier::Explain` has.
   /// @throws Tarvel::InvalidArgumentException when a report that was made in another way has no such check.
-  SSOCLIENT_API const CheckResult &Get(Check check) const;
+  SSOCLIENT_API const CheckResult &Get(Check check) const &;
+
+  /// Not for a temporary report, whose checks end with it.
+  const CheckResult &Get(Check check) const && = delete;
 
   /// The first check that failed, or null.
-  SSOCLIENT_API const CheckResult *FirstFailed() const noexcept;
+  SSOCLIENT_API const CheckResult *FirstFailed() const &noexcept;
+
+  /// Not for a temporary report, whose checks end with it.
+  const CheckResult *FirstFailed() const &&noexcept = delete;
 };
 
 /// The name of a check in lower case with hyphens, such as "well-formed".
