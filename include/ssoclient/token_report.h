@@ -40,10 +40,10 @@ struct UnverifiedClaims {
   boost::optional<std::string> confirmationMethod;           ///< as written; set for methods that are not known, too
   boost::optional<Tarvel::System::DateTime> startDate;       ///< valid from this instant
   boost::optional<Tarvel::System::DateTime> endDate;         ///< no longer valid at this instant
-  boost::optional<bool> renewable;                           ///< whether the service may renew it
-  boost::optional<bool> delegable;                           ///< whether it may be delegated
-  boost::optional<bool> solution;                            ///< whether its subject is a solution
-  boost::optional<std::pair<std::string, std::string>> fullName; ///< first name and last name
+  boost::optional<bool> renewable; ///< whether the service may renew it; false also if that cannot be read
+  boost::optional<bool> delegable; ///< whether it may be delegated; false also if that cannot be read
+  boost::optional<bool> solution;  ///< whether its subject is a solution; false also if that cannot be read
+  boost::optional<std::pair<std::string, std::string>> fullName; ///< first name and last name; empty texts if missing
   std::vector<PrincipalId> groups;                               ///< those that can be read
   std::vector<Delegate> delegationChain;                         ///< those that can be read
   std::set<std::string> audience;                                ///< empty also if there is no restriction
@@ -161,10 +161,16 @@ struct TokenReport {
 
   /// The result of `check`, which every report of `TokenVerifier::Explain` has.
   /// @throws Tarvel::InvalidArgumentException when a report that was made in another way has no such check.
-  SSOCLIENT_API const CheckResult &Get(Check check) const;
+  SSOCLIENT_API const CheckResult &Get(Check check) const &;
+
+  /// Not for a temporary report, whose checks end with it.
+  const CheckResult &Get(Check check) const && = delete;
 
   /// The first check that failed, or null.
-  SSOCLIENT_API const CheckResult *FirstFailed() const noexcept;
+  SSOCLIENT_API const CheckResult *FirstFailed() const &noexcept;
+
+  /// Not for a temporary report, whose checks end with it.
+  const CheckResult *FirstFailed() const &&noexcept = delete;
 };
 
 /// The name of a check in lower case with hyphens, such as "well-formed".

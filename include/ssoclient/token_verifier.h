@@ -17,7 +17,7 @@
 namespace SsoClient {
 
 /// Verifies tokens. Immutable: any number of threads may use one verifier at once. Copies share the prepared keys, so a
-/// copy is cheap.
+/// copy is cheap. Moving copies, so there is no verifier without keys.
 class SSOCLIENT_API TokenVerifier {
 public:
   /// Prepares the trusted keys. The verifier keeps references to the certificates, and a copy of the options.
@@ -25,6 +25,10 @@ public:
   ///        validity dates of the certificates are not checked. A null reference in the list is ignored. With an empty
   ///        list no token is accepted.
   explicit TokenVerifier(const Tarvel::Crypto::CertificateList &trustedCertificates, const VerifyOptions &options = {});
+
+  TokenVerifier(const TokenVerifier &) noexcept = default;            ///< shares the prepared keys
+  TokenVerifier &operator=(const TokenVerifier &) noexcept = default; ///< shares the prepared keys
+  ~TokenVerifier() = default;
 
   /// Parses, checks and verifies the SAML 2.0 assertion in `xml`. The token's `ToXml` is `xml`, byte for byte.
   /// @throws Tarvel::Xml::XMLParseException when `xml` is not a well-formed document.

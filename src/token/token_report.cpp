@@ -66,7 +66,7 @@ void AppendCheck(std::string &text, const CheckResult &result) {
 
 } // namespace
 
-const CheckResult &TokenReport::Get(Check check) const {
+const CheckResult &TokenReport::Get(Check check) const & {
   const auto found =
       std::find_if(checks.begin(), checks.end(), [check](const CheckResult &one) { return one.check == check; });
   if (found == checks.end()) {
@@ -76,7 +76,7 @@ const CheckResult &TokenReport::Get(Check check) const {
   return *found;
 }
 
-const CheckResult *TokenReport::FirstFailed() const noexcept {
+const CheckResult *TokenReport::FirstFailed() const &noexcept {
   const auto failed =
       std::find_if(checks.begin(), checks.end(), [](const CheckResult &one) { return one.outcome == Outcome::FAILED; });
   return failed == checks.end() ? nullptr : &*failed;

@@ -12,6 +12,7 @@
 
 #include <set>
 #include <string>
+#include <utility>
 
 namespace {
 
@@ -19,6 +20,17 @@ using namespace SsoClient;
 using namespace Testing;
 using Check = TokenReport::Check;
 using Outcome = TokenReport::Outcome;
+
+/// Whether a report of this kind of expression returns its checks.
+template <typename Report>
+concept ReturnsChecks = requires(Report &&report) {
+  std::forward<Report>(report).Get(Check::FORM);
+  std::forward<Report>(report).FirstFailed();
+};
+
+static_assert(ReturnsChecks<TokenReport &>);
+static_assert(ReturnsChecks<const TokenReport &>);
+static_assert(!ReturnsChecks<TokenReport>, "the checks of a temporary report end with it");
 
 TokenReport WithOneFinding() {
   TokenReport report;
@@ -46,11 +58,13 @@ TEST(TokenReport, GetsACheckAndTheFirstFailedOne) {
   const TokenReport report = WithOneFinding();
   EXPECT_EQ(&report.checks[2], &report.Get(Check::NAMES));
   EXPECT_EQ(&report.checks[1], report.FirstFailed());
-  EXPECT_EQ(nullptr, TokenReport().FirstFailed());
+  const TokenReport empty;
+  EXPECT_EQ(nullptr, empty.FirstFailed());
 }
 
 TEST(TokenReport, ThrowsForACheckThatItDoesNotHave) {
-  EXPECT_THROWS_MESSAGE(WithOneFinding().Get(Check::FORM), Tarvel::InvalidArgumentException,
+  const TokenReport report = WithOneFinding();
+  EXPECT_THROWS_MESSAGE(report.Get(Check::FORM), Tarvel::InvalidArgumentException,
                         "Invalid argument : the report has no check of number 1");
 }
 

@@ -21,6 +21,7 @@
 #include <string>
 #include <thread>
 #include <typeinfo>
+#include <utility>
 #include <vector>
 
 namespace {
@@ -172,6 +173,17 @@ TEST_F(TokenVerifierTest, AcceptsAnUnrestrictedTokenUnlessTheOptionsRefuseIt) {
   EXPECT_NO_THROW(Verify(TokenFixture("bearer"), options));
   EXPECT_THROWS_MESSAGE(Verify(TokenFixture("bearer-minimal"), options), ParseException,
                         "The token is not restricted to an audience");
+}
+
+TEST_F(TokenVerifierTest, CanBeUsedAfterItWasMovedFrom) {
+  TokenVerifier first(TokenCertificates());
+  const TokenVerifier second(std::move(first));
+  EXPECT_NO_THROW(first.Verify(TokenFixture("bearer"))); // NOLINT(bugprone-use-after-move): promised
+  TokenVerifier third({});
+  third = std::move(first);
+  EXPECT_NO_THROW(first.Verify(TokenFixture("bearer"))); // NOLINT(bugprone-use-after-move): promised
+  EXPECT_NO_THROW(second.Verify(TokenFixture("bearer")));
+  EXPECT_NO_THROW(third.Verify(TokenFixture("bearer")));
 }
 
 TEST_F(TokenVerifierTest, DoesNotCheckTheAudienceWithoutAcceptedAudiences) {
