@@ -30,7 +30,7 @@ struct ResponseReceivedEvent {
   int status = 0;                        ///< the HTTP status; 0 if there was no response
   std::string reason;                    ///< the reason phrase; or, without a response, why there is none
   std::string contentType;               ///< the header's value; empty without a response
-  std::size_t responseOctets = 0;        ///< of the body
+  std::size_t responseOctets = 0;        ///< of the body, which is read only with a status of 2xx or 500
   std::int64_t durationMicroseconds = 0; ///< since the request was sent
   int leg = 0;                           ///< as in `RequestSentEvent`
 };

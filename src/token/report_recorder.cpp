@@ -27,6 +27,17 @@ std::string ReportText(std::string_view text) {
   return Tarvel::StringUtil::Shorten(Tarvel::StringUtil::Printable(text));
 }
 
+namespace {
+
+/// The same for a text of a rule, which may be cut already: it then states how many bytes are missing, so it is not cut again.
+std::string ReportValue(std::string_view text) {
+  constexpr std::size_t LONGEST_NOTE = 40; // "... (N more bytes)"
+  const std::string printable = Tarvel::StringUtil::Printable(text);
+  return printable.size() <= Tarvel::StringUtil::MAX_VALUE_BYTES + LONGEST_NOTE ? printable : ReportText(text);
+}
+
+} // namespace
+
 ReportRecorder::ReportRecorder(TokenReport &report) : m_report(report) {
   m_report.checks.resize(CHECKS);
   for (std::size_t index = 0; index < CHECKS; ++index) {
@@ -89,8 +100,8 @@ void ReportRecorder::AddAt(const Deviation &deviation, std::uint32_t line, std::
     finding.line = deviation.element->GetLine();
     finding.column = deviation.element->GetColumn();
   }
-  finding.wanted = ReportText(deviation.allowed);
-  finding.found = ReportText(deviation.found);
+  finding.wanted = ReportValue(deviation.allowed);
+  finding.found = ReportValue(deviation.found);
   finding.missedBySec = deviation.missedBySec;
   finding.remedy = ReportText(RemedyFor(m_report, m_current->check, finding));
   m_current->findings.push_back(std::move(finding));

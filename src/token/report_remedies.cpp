@@ -72,8 +72,12 @@ std::string ForKeys(const TokenReport &report) {
 }
 
 std::string ForSignature(const TokenReport &report) {
-  const bool isNamed = std::any_of(report.trustedKeys.begin(), report.trustedKeys.end(),
-                                   [](const TokenReport::TrustedKey &key) { return key.isNamed; });
+  const auto &keys = report.trustedKeys;
+  if (std::any_of(keys.begin(), keys.end(), [](const TokenReport::TrustedKey &key) { return key.madeSignature; })) {
+    return "Ask the service's operator to put the certificate of the key that signs into KeyInfo.";
+  }
+  const bool isNamed =
+      std::any_of(keys.begin(), keys.end(), [](const TokenReport::TrustedKey &key) { return key.isNamed; });
   if (isNamed && !FindStranger(report)) {
     return "Use the token exactly as the service sent it. If it is unchanged, it may be forged: it names a trusted "
            "certificate whose key did not make its signature.";

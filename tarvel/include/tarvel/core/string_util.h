@@ -39,7 +39,7 @@ public:
 
   /// `text`, which is UTF-8, with \\uXXXX in place of each character that could control a terminal or begin a new line:
   /// control characters, line and paragraph separators, and characters that change the direction of text. An octet that is
-  /// not part of a UTF-8 sequence is read as the character of that number: it stays, unless that is a control character.
+  /// not part of a UTF-8 sequence is escaped like the character with its number, from 80 to 9F, or stays as it is.
   static std::string Printable(std::string_view text);
 
   /// A new random UUID (RFC 4122, version 4) as 36 lower-case characters, from the system's random source, or from the
