@@ -117,6 +117,18 @@ TEST_F(ExplainSignatureTest, ASignatureThatOnlyClaimsATrustedCertificateMayBeFor
             OnlyFinding(report, Check::SIGNATURE).remedy);
 }
 
+TEST_F(ExplainSignatureTest, AsksForTheRightKeyInfoIfItSelectsAnotherTrustedKey) {
+  SigningChoices choices;
+  choices.key = "other";
+  choices.keyInfo = KeyInfoOf({"sts-rsa"});
+  const TokenReport report =
+      ExplainWith(TokenCertificates({"sts-rsa", "other"}), SignAgain(TokenFixture("bearer"), choices));
+  EXPECT_EQ("signature failed", NotPassed(report));
+  EXPECT_TRUE(report.trustedKeys.at(1).madeSignature);
+  EXPECT_EQ("Ask the service's operator to put the certificate of the key that signs into KeyInfo.",
+            OnlyFinding(report, Check::SIGNATURE).remedy);
+}
+
 TEST_F(ExplainSignatureTest, AsksForTheCertificateWithoutATrustedKey) {
   const TokenReport report = ExplainWith({}, TokenFixture("bearer"));
   EXPECT_EQ("keys failed, signature not done", NotPassed(report));

@@ -4,6 +4,8 @@
 
 #include "support/parsed_document.h"
 
+#include <tarvel/core/string_util.h>
+
 #include <gtest/gtest.h>
 
 #include <string>
@@ -82,6 +84,16 @@ TEST(ReportRecorder, MakesNamesOfElementsPrintable) {
   recorder.Add({"message", &document.Child("b\u061c"), {}, {}, {}, 0});
   EXPECT_EQ("b\\u061C", report.Get(Check::FORM).findings.front().element);
   EXPECT_EQ("/a\\u061C/b\\u061C", report.Get(Check::FORM).findings.front().path);
+}
+
+TEST(ReportRecorder, DoesNotCutAValueAgainThatARuleHasCut) {
+  const std::string cut = Tarvel::StringUtil::Shorten(std::string(5000, 'x'));
+  TokenReport report;
+  ReportRecorder recorder(report);
+  recorder.Begin(Check::FORM);
+  recorder.Add({"message", nullptr, {}, cut, cut, 0});
+  EXPECT_EQ(cut, report.Get(Check::FORM).findings.front().wanted);
+  EXPECT_EQ(cut, report.Get(Check::FORM).findings.front().found);
 }
 
 TEST(ReportRecorder, CutsAllTextsExceptTheRefusal) {
