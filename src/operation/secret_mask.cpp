@@ -59,30 +59,20 @@ SecretText Base64(const void *data, std::size_t length) {
   return SecretText(StringUtil::Base64Encode(static_cast<const std::uint8_t *>(data), length));
 }
 
-enum class Quotes { PLAIN, ENTITIES, NUMBERS };
+/// The forms that services write for each of the two quotes, in any combination.
+constexpr std::string_view QUOTES[] = {"\"", "&quot;", "&#34;", "&#x22;"};
+constexpr std::string_view APOSTROPHES[] = {"'", "&apos;", "&#39;", "&#x27;"};
 
-std::string_view Escape(char c, Quotes quotes) noexcept {
-  switch (c) {
-  case '&':
-    return "&amp;";
-  case '<':
-    return "&lt;";
-  case '>':
-    return "&gt;";
-  case '"':
-    return quotes == Quotes::PLAIN ? "" : quotes == Quotes::ENTITIES ? "&quot;" : "&#34;";
-  case '\'':
-    return quotes == Quotes::PLAIN ? "" : quotes == Quotes::ENTITIES ? "&apos;" : "&#39;";
-  default:
-    return "";
-  }
-}
-
-SecretText Escaped(std::string_view text, Quotes quotes) {
+SecretText Escaped(std::string_view text, std::string_view quote, std::string_view apostrophe) {
   SecretText result;
   for (std::size_t i = 0; i < text.size(); ++i) {
-    const std::string_view escape = Escape(text[i], quotes);
-    result.Append(escape.empty() ? text.substr(i, 1) : escape);
+    const char c = text[i];
+    result.Append(c == '&'    ? "&amp;"
+                  : c == '<'  ? "&lt;"
+                  : c == '>'  ? "&gt;"
+                  : c == '"'  ? quote
+                  : c == '\'' ? apostrophe
+                              : text.substr(i, 1));
   }
   return result;
 }
@@ -227,10 +217,12 @@ void SecretMask::Guard(const AddAll &addAll) noexcept {
 
 void SecretMask::AddText(std::string_view text) {
   AddSecret(SecretText(text));
-  for (const Quotes quotes : {Quotes::PLAIN, Quotes::ENTITIES, Quotes::NUMBERS}) {
-    const SecretText escaped = Escaped(text, quotes);
-    AddSecret(Escaped(escaped.Get(), quotes)); // a service may put one message into another
-    AddSecret(SecretText(escaped));
+  for (const std::string_view quote : QUOTES) {
+    for (const std::string_view apostrophe : APOSTROPHES) {
+      const SecretText escaped = Escaped(text, quote, apostrophe);
+      AddSecret(Escaped(escaped.Get(), quote, apostrophe)); // a service may put one message into another
+      AddSecret(SecretText(escaped));
+    }
   }
 }
 

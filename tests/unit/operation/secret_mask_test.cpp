@@ -40,8 +40,9 @@ TEST(SecretMask, MasksEachOccurrenceOfAPassword) {
 
 TEST(SecretMask, MasksAPasswordEscapedForXmlInEachForm) {
   const std::string password = "a<b>&\"c'd";
-  for (const char *form : {"a<b>&\"c'd", "a&lt;b&gt;&amp;\"c'd", "a&lt;b&gt;&amp;&quot;c&apos;d",
-                           "a&lt;b&gt;&amp;&#34;c&#39;d", "a&amp;lt;b&amp;gt;&amp;amp;\"c'd"}) {
+  for (const char *form :
+       {"a<b>&\"c'd", "a&lt;b&gt;&amp;\"c'd", "a&lt;b&gt;&amp;&quot;c&apos;d", "a&lt;b&gt;&amp;&#34;c&#39;d",
+        "a&lt;b&gt;&amp;&quot;c&#x27;d", "a&lt;b&gt;&amp;&#x22;c'd", "a&amp;lt;b&amp;gt;&amp;amp;\"c'd"}) {
     EXPECT_EQ(Masked(password, std::string("[") + form + "]"), "[***]") << form;
   }
 }
