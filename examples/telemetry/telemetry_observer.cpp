@@ -70,8 +70,8 @@ void TelemetryObserver::OnRequestSent(const OperationInfo &operation, const SsoC
   span.kind = SpanKind::CLIENT;
   span.start = system_clock::now();
   span.attributes = Server();
-  span.attributes.Add("url.full",
-                      (m_isSecure ? "https://" : "http://") + m_host + ":" + std::to_string(m_port) + m_path);
+  const std::string host = m_host.find(':') == std::string::npos ? m_host : "[" + m_host + "]"; // IPv6
+  span.attributes.Add("url.full", (m_isSecure ? "https://" : "http://") + host + ":" + std::to_string(m_port) + m_path);
   span.attributes.Add("http.request.body.size", static_cast<std::int64_t>(event.requestOctets));
   span.attributes.Add("ssoclient.action", event.action);
   if (event.leg > 0) {

@@ -6,6 +6,7 @@
 #include <tarvel/core/ref.h>
 #include <tarvel/io/reader.h>
 
+#include <new>
 #include <utility>
 
 namespace SsoClient::InternalApi {
@@ -26,16 +27,19 @@ GssNegotiationContextImpl::GssNegotiationContextImpl(const TokenSpec &spec,
 
 GssNegotiationResult GssNegotiationContextImpl::NegotiateToken(const std::vector<std::uint8_t> &leg) {
   const std::string newId;
-  OperationEvents events(m_observer.get(), "NegotiateToken", newId);
+  OperationEvents events(m_isObserved ? m_observer.get() : nullptr, "NegotiateToken", newId);
   return events.Run([&] { return Negotiate(leg, events); });
 }
 
 GssNegotiationResult GssNegotiationContextImpl::Negotiate(const std::vector<std::uint8_t> &leg,
                                                           OperationEvents &events) {
   events.SetLeg(m_answeredLegs + 1);
-  events.HideLeg(leg);
+  for (const std::vector<std::uint8_t> &earlier : m_earlierLegs) {
+    events.HideLeg(earlier);
+  }
+  HideLeg(leg, events);
   const SPNegoResponse response = Exchange(leg, events);
-  events.HideLeg(response.leg);
+  HideLeg(response.leg, events);
   ++m_answeredLegs;
   m_contextId = response.contextId;
   GssNegotiationResult result;
@@ -44,6 +48,18 @@ GssNegotiationResult GssNegotiationContextImpl::Negotiate(const std::vector<std:
     result.token = m_returnedTokens.Verify(response.tokenXml, events);
   }
   return result;
+}
+
+void GssNegotiationContextImpl::HideLeg(const std::vector<std::uint8_t> &leg, OperationEvents &events) noexcept {
+  events.HideLeg(leg);
+  if (!m_observer) {
+    return;
+  }
+  try {
+    m_earlierLegs.push_back(leg);
+  } catch (const std::bad_alloc &) {
+    m_isObserved = false; // later events could contain the leg
+  }
 }
 
 SPNegoResponse GssNegotiationContextImpl::Exchange(const std::vector<std::uint8_t> &leg,

@@ -36,6 +36,8 @@ public:
 
 private:
   GssNegotiationResult Negotiate(const std::vector<std::uint8_t> &leg, OperationEvents &events);
+  /// No event of this operation or a later one contains the leg.
+  void HideLeg(const std::vector<std::uint8_t> &leg, OperationEvents &events) noexcept;
   SPNegoResponse Exchange(const std::vector<std::uint8_t> &leg, OperationEvents &events) const;
 
   TokenSpec m_spec;
@@ -46,6 +48,8 @@ private:
   const ReturnedTokens m_returnedTokens;
   std::shared_ptr<OperationObserver> m_observer;
   int m_answeredLegs = 0;
+  bool m_isObserved = true;                             // false after there was no memory for a leg in m_earlierLegs
+  std::vector<std::vector<std::uint8_t>> m_earlierLegs; // of both sides; empty without an observer
 };
 
 } // namespace SsoClient::InternalApi

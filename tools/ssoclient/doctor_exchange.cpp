@@ -94,11 +94,9 @@ void ReadResponse(Tarvel::Http::ClientResponse &response, DoctorExchange &exchan
   }
 }
 
-/// Whether the exception reports that the connection ended before any octet arrived.
-bool SaysNothingCame(const Tarvel::Http::HttpException &failure) {
-  const std::string_view text = failure.what();
-  constexpr std::string_view END = "the connection ended before it";
-  return text.size() >= END.size() && text.substr(text.size() - END.size()) == END;
+/// Whether the exception reports that the connection ended before the response was complete.
+bool IsCutShort(const Tarvel::Http::HttpException &failure) {
+  return std::string_view(failure.what()).find("the connection ended ") != std::string_view::npos;
 }
 
 std::string SizeText(const DoctorExchange &exchange) {
@@ -203,7 +201,7 @@ DoctorExchange Exchange(const DoctorTarget &target, const Ref<Tarvel::Ssl::SSLCo
   } catch (const Tarvel::Http::HttpException &failure) {
     end();
     exchange.failure = failure.what();
-    exchange.hasOtherProtocol = !SaysNothingCame(failure);
+    exchange.hasOtherProtocol = !IsCutShort(failure);
   } catch (const Tarvel::System::NetworkException &failure) {
     end();
     exchange.failure = failure.what();

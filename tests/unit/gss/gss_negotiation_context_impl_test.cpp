@@ -145,6 +145,16 @@ TEST(GssNegotiationContext, MasksALegThatTheServiceRepeats) {
   EXPECT_EQ(observer->Lines().back(), "ended InvalidCredentialsException: no ***");
 }
 
+TEST(GssNegotiationContext, MasksTheLegsOfEarlierCalls) {
+  const auto observer = std::make_shared<Testing::RecordedEvents>();
+  ServiceOptions options;
+  options.observer = observer;
+  const GssNegotiation negotiation({"leg:ctx|service-leg|", "fault:no Y2xpZW50LWxlZw== or c2VydmljZS1sZWc="}, options);
+  negotiation.Negotiate("client-leg");
+  EXPECT_THROW(negotiation.Negotiate("another-leg"), InvalidCredentialsException);
+  EXPECT_EQ(observer->Lines().back(), "ended InvalidCredentialsException: no *** or ***");
+}
+
 TEST(GssNegotiationContext, PassesARefusedTokenToTheSink) {
   Texts refused;
   ServiceOptions options;

@@ -203,7 +203,12 @@ TEST(Exchange, ReadsHeadersAndBody) {
 
 TEST(Exchange, ReportsWhatIsNotHttp) {
   EXPECT_TRUE(ExchangeWith("220 mail.example ESMTP\r\n\r\n").hasOtherProtocol);
-  EXPECT_TRUE(ExchangeWith("HTTP/1.1 200 OK\r\nContent-Length: 9\r\n\r\nshort").hasOtherProtocol);
+}
+
+TEST(Exchange, ReportsAConnectionThatEndsTooEarly) {
+  EXPECT_FALSE(ExchangeWith("HTTP/1.1 200 OK\r\nContent-Length: 9\r\n\r\nshort").hasOtherProtocol);
+  EXPECT_FALSE(ExchangeWith("HTTP/1.1 200 OK\r\nContent-Le").hasOtherProtocol);
+  EXPECT_FALSE(ExchangeWith("HTTP/1.1 200 OK\r\nTransfer-Encoding: chunked\r\n\r\n9\r\nshort").hasOtherProtocol);
   const DoctorExchange closed = ExchangeWith("");
   EXPECT_FALSE(closed.hasOtherProtocol);
   EXPECT_EQ("the connection ended before it", closed.failure.substr(closed.failure.rfind(": ") + 2));
