@@ -10,6 +10,7 @@
 #include <cstdint>
 #include <pthread.h>
 #include <thread>
+#include <unistd.h>
 #include <utility>
 
 namespace Tarvel {
@@ -33,9 +34,10 @@ std::array<Shard, SHARDS> shards;
 std::atomic<int> forking{0};
 std::atomic<unsigned> generation{0};
 std::atomic<ForkListener *> listener{nullptr};
-std::mutex forks;     // held during a fork: there is one at a time
-bool isQuiet = false; // during a fork: no other thread computes
-std::atomic<bool> registers{false};
+std::mutex forks;                      // held during a fork: there is one at a time
+bool isQuiet = false;                  // during a fork: no other thread computes
+std::atomic<bool> isRegistered{false}; // whether the functions below are called at each fork
+std::atomic<pid_t> registrar{0};       // the process in which a thread registers them, or 0
 
 thread_local unsigned depth = 0;           // how many computations the thread has begun
 thread_local bool isForkingThread = false; // that thread never waits: all others wait for it
@@ -123,6 +125,7 @@ void AfterForkInParent() noexcept {
 
 void AfterForkInChild() noexcept {
   generation.fetch_add(1);
+  isRegistered.store(true); // the thread that registers may not have set it yet, and does not exist here
   // A thread that was about to begin may have counted itself for a moment.
   for (Shard &shard : shards) {
     shard.threads.store(0);
@@ -135,13 +138,31 @@ void AfterForkInChild() noexcept {
   EndFork();
 }
 
-/// Called with the first computation, and so before our first thread starts.
+/// Whether the calling thread must register the functions. If another thread of this process does so, waits for it. If a
+/// thread of the parent did so when the parent forked, this process must do it.
+bool IsToRegister() noexcept {
+  const pid_t self = getpid();
+  while (!isRegistered.load()) {
+    pid_t process = registrar.load();
+    if (process == self) {
+      std::this_thread::sleep_for(WAIT_STEP);
+    } else if (registrar.compare_exchange_strong(process, self)) {
+      return true;
+    }
+  }
+  return false;
+}
+
+/// Called with each computation. No thread computes before the functions are registered: a fork that began earlier would
+/// not wait for it. The C library registers nothing while a fork is under way.
 void RegisterOnce() noexcept {
-  if (registers.load(std::memory_order_relaxed) || registers.exchange(true)) {
+  if (isRegistered.load(std::memory_order_acquire) || !IsToRegister()) {
     return;
   }
-  if (pthread_atfork(BeforeFork, AfterForkInParent, AfterForkInChild) != 0) {
-    registers.store(false); // no memory; the next computation tries again
+  if (pthread_atfork(BeforeFork, AfterForkInParent, AfterForkInChild) == 0) {
+    isRegistered.store(true);
+  } else {
+    registrar.store(0); // no memory; the next computation tries again
   }
 }
 
