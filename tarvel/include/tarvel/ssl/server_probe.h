@@ -76,7 +76,7 @@ struct HandshakeProbe {
   /// the chain.
   Ref<const Crypto::Certificate> anchor;
 
-  /// Every reason, in the order in which they were found. `failure` reports the first one.
+  /// The reasons to refuse the server, at most 100, in the order in which they were found. `failure` reports the first.
   std::vector<ServerRefusal> refusals;
 };
 
@@ -90,10 +90,10 @@ struct AddressProbe {
     FAILED        ///< any other failure
   };
 
-  std::string address; ///< IPv4 or IPv6, without brackets
-  Outcome outcome = Outcome::FAILED;
-  std::string reason; ///< why no connection was made, as text; empty if the address answered
-  std::int64_t durationMicroseconds = 0;
+  std::string address;                   ///< IPv4 or IPv6, without brackets
+  Outcome outcome = Outcome::FAILED;     ///< how it ended
+  std::string reason;                    ///< why no connection was made, as text; empty if the address answered
+  std::int64_t durationMicroseconds = 0; ///< how long it took
 };
 
 /// What `ProbeServer` has found.
