@@ -16,6 +16,7 @@
 
 #include <cstdint>
 #include <future>
+#include <memory>
 #include <stdexcept>
 #include <string>
 #include <vector>
@@ -336,18 +337,19 @@ TEST(ProbeServer, ReportsWhyANameHasNoAddress) {
 }
 
 TEST(ProbeServer, EndsWhenTheResolverDoesNotAnswer) {
-  std::promise<void> end;
-  const std::shared_future<void> ended = end.get_future().share();
-  std::promise<void> begun;
-  const System::ScopedNameLookup lookup([&](const std::string &) -> System::AddressList {
-    begun.set_value();
-    ended.wait();
-    throw System::NetworkException("late");
-  });
+  // The look-up continues after the call, so it shares what it waits for.
+  const auto end = std::make_shared<std::promise<void>>();
+  const auto begun = std::make_shared<std::promise<void>>();
+  const System::ScopedNameLookup lookup(
+      [begun, ended = end->get_future().share()](const std::string &) -> System::AddressList {
+        begun->set_value();
+        ended.wait();
+        throw System::NetworkException("late");
+      });
   EXPECT_EQ("the resolver did not answer in time",
             ProbeServer("slow.example", 443, nullptr, "", IMPATIENCE).lookupFailure);
-  begun.get_future().wait(); // a look-up that begins after this scope would not call the function above
-  end.set_value();
+  begun->get_future().wait(); // a look-up that begins after this scope would not call the function above
+  end->set_value();
 }
 
 TEST(ProbeServer, NeedsNoContextWithoutTls) {

@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 // The events of each operation: success, fault, a transport that fails, a response of another form, a refused token.
-#include "unit/service/observed_operations.h"
+#include "unit/observed_service/observed_operations.h"
 
 #include "support/fixed_environment.h"
 #include "support/recorded_log.h"

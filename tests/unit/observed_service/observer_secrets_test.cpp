@@ -1,7 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 // No event and no log line contains the password, the token or a signature value of an operation: for everything that
 // the service can repeat, for each way in which the operation can fail, and at every level of the log.
-#include "unit/service/observed_operations.h"
+#include "unit/observed_service/observed_operations.h"
 
 #include "support/recorded_log.h"
 #include "support/throws_message.h"
