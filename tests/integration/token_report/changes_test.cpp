@@ -72,8 +72,12 @@ TEST_F(ReportsOnChanges, AreRightForTokens) {
   const OutcomeCount count = JudgeTexts("tokens");
   EXPECT_GT(count.GetAccepted(), Changes() / 4);
   EXPECT_GT(count.GetDifferentRefusals(), 10 * Changes());
-  for (const char *const check : {"well-formed", "form", "validity", "algorithms", "keys", "references", "signature",
-                                  "digests", "audience", "required-confirmation"}) {
+  std::vector<std::string> checks = {"well-formed", "form", "signature"};
+  if (!Testing::IS_SANITIZED) { // so few changes do not reach the others
+    checks.insert(checks.end(),
+                  {"validity", "algorithms", "keys", "references", "digests", "audience", "required-confirmation"});
+  }
+  for (const std::string &check : checks) {
     EXPECT_GT(count.GetFirstFailed().count(check), 0u) << check;
   }
 }
