@@ -6,6 +6,7 @@
 #include "crypto/library_context.h"
 #include "crypto/openssl_clean_up.h"
 #include "crypto/openssl_errors.h"
+#include "system/thread_pool.h"
 
 #include <tarvel/core/exception.h>
 
@@ -68,6 +69,17 @@ void OnCleanUp() noexcept {
   OpenSslCleanUpNotice::CallAll();
 }
 
+/// For idle threads of the pool. OpenSSL keeps an object for each thread. A thread that ended after the clean-up would
+/// leak it.
+bool FreeObjectsOfThread() noexcept {
+  const OpenSslGuard guard;
+  if (!guard) {
+    return false;
+  }
+  OPENSSL_thread_stop();
+  return true;
+}
+
 } // namespace
 
 OpenSslGuard::OpenSslGuard() noexcept : m_count(TryBegin()) {}
@@ -112,6 +124,7 @@ void OpenSslGuard::Prepare() {
     if (OPENSSL_atexit(OnCleanUp) != 1) {
       errors.Throw("Cannot initialise OpenSSL");
     }
+    System::SetThreadEndHook(FreeObjectsOfThread);
   });
 }
 

@@ -124,10 +124,21 @@ private:
   std::atomic<Stage> m_stage{Stage::QUEUED};
 };
 
+// Constant-initialised and never destroyed.
+std::atomic<ThreadEndHook> threadEndHook{nullptr};
+
+/// Whether the calling thread, which is idle, may end now.
+bool MayEnd(const PoolState &pool) noexcept {
+  const ThreadEndHook hook = pool.isEndless ? threadEndHook.load() : nullptr;
+  return !hook || hook();
+}
+
 /// The next item to run; null when the thread has been idle for long enough, or the pool has ended.
 Ref<WorkItem> WaitForWork(PoolState &pool, std::unique_lock<ForkSafeMutex> &lock) {
   ++pool.idle;
-  pool.changed.wait_for(lock, pool.idleTime, [&pool] { return pool.ended || !pool.queue.empty(); });
+  while (!pool.changed.wait_for(lock, pool.idleTime, [&pool] { return pool.ended || !pool.queue.empty(); }) &&
+         !MayEnd(pool)) {
+  }
   --pool.idle;
   if (pool.ended || pool.queue.empty()) {
     return {};
@@ -301,6 +312,10 @@ Ref<ThreadPool> CreateThreadPool(std::size_t threadCeiling, std::chrono::millise
 
 Ref<ThreadPool> CreateEndlessThreadPool(std::size_t threadCeiling, std::chrono::milliseconds idleTime) {
   return MakeRef<ThreadPoolImpl>(threadCeiling, idleTime, true);
+}
+
+ThreadEndHook SetThreadEndHook(ThreadEndHook hook) noexcept {
+  return threadEndHook.exchange(hook);
 }
 
 } // namespace Tarvel::System

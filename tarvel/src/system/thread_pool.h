@@ -12,4 +12,12 @@ namespace Tarvel::System {
 /// must never release the reference.
 Ref<ThreadPool> CreateEndlessThreadPool(std::size_t threadCeiling, std::chrono::milliseconds idleTime);
 
+/// Frees what a library keeps for the calling thread, and returns true; or returns false if that can no longer be
+/// freed. It must not block, start work or use the pool.
+using ThreadEndHook = bool (*)() noexcept;
+
+/// Makes each idle thread of an endless pool call `hook` before it ends. If `hook` returns false, the thread stays, and
+/// asks again after another idle time. Returns the earlier hook; null stands for none.
+ThreadEndHook SetThreadEndHook(ThreadEndHook hook) noexcept;
+
 } // namespace Tarvel::System

@@ -7,6 +7,7 @@
 #include "crypto/public_key.h"
 #include "fixtures.h"
 #include "support/process_resources.h"
+#include "system/thread_pool.h"
 
 #include <tarvel/crypto/system_configuration.h>
 
@@ -15,9 +16,11 @@
 
 #include <array>
 #include <atomic>
+#include <chrono>
 #include <cstdint>
 #include <cstdlib>
 #include <functional>
+#include <future>
 #include <iostream>
 #include <memory>
 #include <string>
@@ -140,6 +143,29 @@ void CleanUpWhileThePassphraseIsAskedFor() {
     });
   });
   std::_Exit(0);
+}
+
+/// Leaves a thread idle that has used OpenSSL, and reports whether it ends before the clean-up, and after it.
+void WaitForAnIdleThread() {
+  static const Ref<System::ThreadPool> pool = System::CreateEndlessThreadPool(1, std::chrono::milliseconds(1));
+  const auto work = std::make_shared<const TokenWork>();
+  pool->QueueWorkItem([work] { work->Run(); });
+  std::cerr << "before: " << Testing::Eventually([] { return pool->GetThreadCount() == 0; });
+  std::promise<void> cleaned;
+  pool->QueueWorkItem([&cleaned, &work] {
+    work->Run();
+    OPENSSL_cleanup();
+    cleaned.set_value();
+  });
+  cleaned.get_future().wait();
+  std::this_thread::sleep_for(std::chrono::milliseconds(100));
+  std::cerr << ", after: " << (pool->GetThreadCount() == 0) << "\n";
+  std::_Exit(0);
+}
+
+TEST(OpenSslGuardDeathTest, KeepsIdleThreadsAfterTheCleanUp) {
+  testing::FLAGS_gtest_death_test_style = "threadsafe";
+  EXPECT_EXIT(WaitForAnIdleThread(), testing::ExitedWithCode(0), "^before: 1, after: 0\n$");
 }
 
 TEST(OpenSslGuardDeathTest, RefusesUseAfterACleanUpDuringThePassphraseCallback) {

@@ -5,6 +5,7 @@
 #include "support/completion.h"
 #include "support/process_resources.h"
 #include "support/scripted_server.h"
+#include "system/thread_pool.h"
 
 #include <tarvel/core/exception.h>
 #include <tarvel/service/app.h>
@@ -115,6 +116,25 @@ TEST(ThreadPool, IdleThreadsRetire) {
   std::promise<void> again;
   pool->QueueWorkItem([&again] { again.set_value(); });
   EXPECT_EQ(again.get_future().wait_for(PATIENCE), std::future_status::ready);
+}
+
+TEST(ThreadPool, AnIdleThreadOfAnEndlessPoolStaysUntilTheHookLetsItEnd) {
+  static std::atomic<int> calls{0};
+  static std::atomic<bool> mayEnd{false};
+  const ThreadEndHook earlier = SetThreadEndHook([]() noexcept {
+    ++calls;
+    return mayEnd.load();
+  });
+  static const Ref<ThreadPool> pool = CreateEndlessThreadPool(1, std::chrono::milliseconds(1));
+  pool->QueueWorkItem([] {});
+  EXPECT_TRUE(Eventually([] { return calls >= 3; }));
+  EXPECT_EQ(pool->GetThreadCount(), 1u);
+  std::promise<void> served;
+  pool->QueueWorkItem([&served] { served.set_value(); });
+  EXPECT_EQ(served.get_future().wait_for(PATIENCE), std::future_status::ready);
+  mayEnd = true;
+  EXPECT_TRUE(Eventually([] { return pool->GetThreadCount() == 0; }));
+  SetThreadEndHook(earlier);
 }
 
 TEST(ThreadPool, LogsAnExceptionAndEndsThatItemOnly) {
