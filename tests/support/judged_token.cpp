@@ -2,39 +2,19 @@
 
 #include "support/judged_token.h"
 
+#include "support/exception_class.h"
 #include "support/report_places.h"
 #include "support/report_rules.h"
 #include "support/report_texts.h"
 #include "xml/xml_text.h"
 
-#include <ssoclient/exceptions.h>
 #include <tarvel/xml/parser.h>
-#include <tarvel/xml/security/exceptions.h>
-
-#include <typeinfo>
 
 namespace Testing {
 
 using namespace SsoClient;
 
 namespace {
-
-std::string ClassOf(const std::exception &failure) {
-  const std::type_info &type = typeid(failure);
-  if (type == typeid(ParseException)) {
-    return "ParseException";
-  }
-  if (type == typeid(InvalidSignatureException)) {
-    return "InvalidSignatureException";
-  }
-  if (type == typeid(Tarvel::Xml::XMLParseException)) {
-    return "XMLParseException";
-  }
-  if (type == typeid(Tarvel::Xml::Security::XmlSecurityException)) { // documented for elements without canonical form
-    return "XmlSecurityException";
-  }
-  return "undocumented";
-}
 
 template <typename Input>
 Verification TryToVerify(const TokenVerifier &verifier, const Input &input) {

@@ -4,15 +4,13 @@
 
 #include "heap_octets.h"
 #include "outcome.h"
-#include "support/data_file.h"
-#include "support/work_folder.h"
+#include "support/signed_again.h"
 
 #include <tarvel/xml/parser.h>
 
 #include <gtest/gtest.h>
 
 #include <cstddef>
-#include <cstdlib>
 #include <string>
 
 namespace Attacks {
@@ -155,22 +153,7 @@ protected:
     const std::size_t begin = xml.find(first);
     const std::string groups = xml.substr(begin, xml.find("</saml:Attribute>", begin) - begin);
     xml.insert(begin, Repeated(groups, 104));
-    Empty(xml, "ds:DigestValue");
-    Empty(xml, "ds:SignatureValue");
-
-    const Testing::WorkFolder folder;
-    const std::string in = folder.Write("in.xml", xml);
-    const std::string out = folder / "out.xml";
-    const std::string command = "xmlsec1 --sign --privkey-pem " + Testing::DataPath("tokens/sts-rsa.key") +
-                                " --id-attr:ID urn:oasis:names:tc:SAML:2.0:assertion:Assertion --output " + out + " " +
-                                in + " 2>" + folder / "log";
-    ASSERT_EQ(0, std::system(command.c_str()));
-    m_xml = folder.Read("out.xml");
-  }
-
-  static void Empty(std::string &xml, const std::string &element) {
-    const std::size_t begin = xml.find("<" + element + ">") + element.size() + 2;
-    xml.erase(begin, xml.find("</" + element, begin) - begin);
+    m_xml = Testing::SignedAgain(xml);
   }
 
   std::string m_xml;

@@ -3,46 +3,26 @@
 #include "outcome.h"
 
 #include "support/data_file.h"
+#include "support/exception_class.h"
 #include "support/facts_of.h"
 #include "xml/xml_text.h"
 
 #include <ssoclient/create_saml_token.h>
-#include <ssoclient/exceptions.h>
 #include <tarvel/xml/parser.h>
-#include <tarvel/xml/security/exceptions.h>
 
 #include <stdexcept>
-#include <typeinfo>
 
 namespace Attacks {
 namespace {
 
 using namespace SsoClient;
 
-// The exact class counts: a class derived from a documented one would be unexpected too.
-std::string ClassOf(const std::exception &failure) {
-  const std::type_info &type = typeid(failure);
-  if (type == typeid(ParseException)) {
-    return "ParseException";
-  }
-  if (type == typeid(InvalidSignatureException)) {
-    return "InvalidSignatureException";
-  }
-  if (type == typeid(Tarvel::Xml::XMLParseException)) {
-    return "XMLParseException";
-  }
-  if (type == typeid(Tarvel::Xml::Security::XmlSecurityException)) { // documented for elements without canonical form
-    return "XmlSecurityException";
-  }
-  return "undocumented";
-}
-
 template <typename Factory>
 Outcome Try(const Factory &factory) {
   try {
     return {"", Testing::FactsOf(*factory())};
   } catch (const std::exception &failure) {
-    return {ClassOf(failure), failure.what()};
+    return {Testing::ClassOf(failure), failure.what()};
   } catch (...) {
     return {"undocumented", "no std::exception"};
   }

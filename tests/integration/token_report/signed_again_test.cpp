@@ -1,11 +1,11 @@
 // SPDX-License-Identifier: Apache-2.0
 // Tokens with a genuine signature that are refused for their content.
 
-#include "signed_again.h"
 #include "verifiers.h"
 
 #include "support/data_file.h"
 #include "support/fixed_environment.h"
+#include "support/signed_again.h"
 
 #include <gtest/gtest.h>
 
@@ -19,6 +19,7 @@ using SsoClient::TokenReport;
 using Testing::JudgedVerifier;
 using Testing::Judgement;
 using Testing::JudgeText;
+using Testing::SignedAgain;
 
 struct SignedChange {
   const char *name;

@@ -158,7 +158,7 @@ void WaitForAnIdleThread() {
     cleaned.set_value();
   });
   cleaned.get_future().wait();
-  std::this_thread::sleep_for(std::chrono::milliseconds(100));
+  std::this_thread::sleep_for(std::chrono::milliseconds(100)); // a hundred times the idle time
   std::cerr << ", after: " << (pool->GetThreadCount() == 0) << "\n";
   std::_Exit(0);
 }

@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 
-#include "signed_again.h"
+#include "support/signed_again.h"
 
 #include "support/data_file.h"
 #include "support/work_folder.h"
@@ -8,7 +8,7 @@
 #include <cstdlib>
 #include <stdexcept>
 
-namespace Reports {
+namespace Testing {
 
 namespace {
 
@@ -22,10 +22,10 @@ void Empty(std::string &xml, const std::string &element) {
 std::string SignedAgain(std::string xml) {
   Empty(xml, "ds:DigestValue");
   Empty(xml, "ds:SignatureValue");
-  const Testing::WorkFolder folder;
+  const WorkFolder folder;
   const std::string in = folder.Write("in.xml", xml);
   const std::string out = folder / "out.xml";
-  const std::string command = "xmlsec1 --sign --privkey-pem " + Testing::DataPath("tokens/sts-rsa.key") +
+  const std::string command = "xmlsec1 --sign --privkey-pem " + DataPath("tokens/sts-rsa.key") +
                               " --id-attr:ID urn:oasis:names:tc:SAML:2.0:assertion:Assertion --output " + out + " " +
                               in + " 2>" + folder / "log";
   if (std::system(command.c_str()) != 0) {
@@ -34,4 +34,4 @@ std::string SignedAgain(std::string xml) {
   return folder.Read("out.xml");
 }
 
-} // namespace Reports
+} // namespace Testing

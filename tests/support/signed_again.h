@@ -6,10 +6,10 @@
 
 #include <string>
 
-namespace Reports {
+namespace Testing {
 
 /// `xml`, an assertion with a signature, signed again by xmlsec1 with the key of tests/data/tokens/sts-rsa.key.
 /// @throws std::runtime_error if xmlsec1 cannot sign it.
 std::string SignedAgain(std::string xml);
 
-} // namespace Reports
+} // namespace Testing
