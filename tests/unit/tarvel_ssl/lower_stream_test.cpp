@@ -1,6 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 // TLS over streams that throw, or on which writing fails.
 
+#include "support/process_resources.h"
 #include "system/io_engine.h"
 #include "unit/tarvel_ssl/tls_client.h"
 
@@ -38,6 +39,9 @@ public:
 
   void Break() { m_isBroken = true; }
 
+  /// Whether a write is under way that began before `Break`.
+  bool IsWriting() const { return m_writes != 0; }
+
   void AsyncReadSome(char *buffer, std::size_t length, TransferHandler handler) override {
     const std::function<void()> read = [inner = m_inner, buffer, length, handler = std::move(handler)] {
       inner->AsyncReadSome(buffer, length, handler);
@@ -53,7 +57,13 @@ public:
   }
   void AsyncWrite(const char *bytes, std::size_t length, TransferHandler handler) override {
     if (!m_isBroken) {
-      m_inner->AsyncWrite(bytes, length, std::move(handler));
+      ++m_writes;
+      m_inner->AsyncWrite(bytes, length,
+                          [self = Ref<BrokenWriter>(this), handler = std::move(handler)](std::size_t count,
+                                                                                         const Exception *exception) {
+                            handler(count, exception); // starts the next write, if there is one
+                            --self->m_writes;
+                          });
       return;
     }
     boost::asio::post(System::GetIoContext(), [self = Ref<BrokenWriter>(this), handler = std::move(handler)] {
@@ -79,6 +89,7 @@ private:
 
   const Ref<System::Stream> m_inner;
   std::atomic<bool> m_isBroken{false};
+  std::atomic<int> m_writes{0};
   std::mutex m_mutex;                  // guards all that follows
   bool m_hasFailed = false;            // whether the handler of a failed write has been called
   std::function<void()> m_waitingRead; // empty for none
@@ -100,6 +111,8 @@ public:
     }
     stream->AsyncHandshake("localhost", "", handshake.ForEnd());
     EXPECT_TRUE(handshake.Wait());
+    // The client's part of the handshake ends before its last message is written, for which the server waits.
+    EXPECT_TRUE(Testing::Eventually([&lower] { return !lower->IsWriting(); }));
     lower->Break();
   }
 
