@@ -5,6 +5,7 @@
 #pragma once
 
 #include <ssoclient/operation_observer.h>
+#include <ssoclient/service_dialect.h>
 #include <ssoclient/verify_options.h>
 
 #include <functional>
@@ -19,6 +20,9 @@ struct ServiceOptions {
   /// called on the thread that runs the operation. **The text may be a usable bearer token for another program, so it
   /// is secret.** What the function throws is written to the log and changes nothing else.
   using RefusedTokenSink = std::function<void(const std::string &tokenXml)>;
+
+  /// How the service wants to be asked.
+  ServiceDialect dialect;
 
   /// How the tokens that the service returns are verified.
   VerifyOptions verifyOptions;

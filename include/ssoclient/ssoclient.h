@@ -21,7 +21,9 @@
 #include <ssoclient/saml_token.h>
 #include <ssoclient/security_token_service.h>
 #include <ssoclient/security_token_service_config.h>
+#include <ssoclient/service_dialect.h>
 #include <ssoclient/service_options.h>
+#include <ssoclient/token_details.h>
 #include <ssoclient/token_report.h>
 #include <ssoclient/token_spec.h>
 #include <ssoclient/token_verifier.h>

@@ -19,7 +19,8 @@ constexpr std::int64_t DEFAULT_CLOCK_TOLERANCE_SEC = 600;
 
 /// The form of assertion that is accepted.
 enum class TokenProfile : std::int32_t {
-  STRICT = 0 ///< the form that the token service issues: its elements and attributes in their order, and no others
+  STRICT = 0, ///< the form that the token service issues: its elements and attributes in their order, and no others
+  SAML2 ///< what SAML 2.0 core lets an issuer of authentication and attribute assertions write; reads all that STRICT reads
 };
 
 /// What is checked of a token, in addition to its form, its consistency and its signature. The defaults are those of
@@ -39,8 +40,21 @@ struct VerifyOptions {
   /// Whether a token without a restriction to audiences is accepted. Only used if `acceptedAudiences` is not empty.
   bool acceptUnrestrictedAudience = true;
 
-  /// The confirmation that a token must have; `boost::none` accepts bearer and holder-of-key tokens.
+  /// The confirmation that a token must have; `boost::none` accepts bearer and holder-of-key tokens. With the profile
+  /// SAML2, a token may have several confirmations. Only those of the required kind are then used.
   boost::optional<SamlToken::ConfirmationType> requiredConfirmation;
+
+  /// The addresses of this program (`Recipient`), compared byte for byte. If the set is not empty, a bearer confirmation is
+  /// used only if it names one of them; if it is empty, a recipient is not checked. Only for the profile SAML2.
+  std::set<std::string> acceptedRecipients;
+
+  /// The identifier of the request that the token must answer (`InResponseTo`). If set, a bearer confirmation is used
+  /// only if it states exactly this identifier; if not, what it states is not checked. Only for the profile SAML2.
+  boost::optional<std::string> expectedInResponseTo;
+
+  /// The network address of the token's sender. If set, a confirmation that states another `Address` is not used; if
+  /// not, the address is not checked. Only for the profile SAML2.
+  boost::optional<std::string> senderAddress;
 };
 
 } // namespace SsoClient

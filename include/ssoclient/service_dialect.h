@@ -1,0 +1,78 @@
+// SPDX-License-Identifier: Apache-2.0
+/// @file
+/// `ServiceDialect`, how a token service of another maker wants to be asked.
+
+#pragma once
+
+#include <ssoclient/export.h>
+
+#include <boost/optional.hpp>
+
+#include <cstdint>
+#include <string>
+#include <vector>
+
+namespace SsoClient {
+
+/// The name of a SOAP fault.
+struct FaultName {
+  std::string namespaceUri; ///< of the fault code
+  std::string localName;    ///< of the fault code
+};
+
+/// What a request says and does not say, where services differ. Each default is what this client has always sent: a
+/// default dialect changes no octet of any message. `docs/interoperate.md` says which symptom each switch cures.
+struct SSOCLIENT_API ServiceDialect {
+  /// When an element that only states a choice is written.
+  enum class Statement : std::int32_t {
+    ALWAYS = 0, ///< with its value, true or false
+    WHEN_TRUE,  ///< only when it asks for something
+    NEVER       ///< not at all; a specification that asks for it is refused
+  };
+  /// What `wst:UseKey` contains in a request for a holder-of-key token.
+  enum class UseKey : std::int32_t {
+    REFERENCE = 0, ///< nothing: its `Sig` names the message signature; not written when a token is presented
+    CERTIFICATE,   ///< the certificate in a `ds:X509Data`, also when a token is presented
+    NEVER          ///< the element is not written
+  };
+  /// How the party is named to which the token is delegated.
+  enum class Delegation : std::int32_t {
+    DELEGATE_TO = 0, ///< `wst:DelegateTo` (WS-Trust 1.3)
+    ON_BEHALF_OF,    ///< `wst:OnBehalfOf` (WS-Trust 1.3): the token is about that party
+    ACT_AS           ///< `wst14:ActAs` (WS-Trust 1.4)
+  };
+
+  /// Whether `Content-Type` declares `charset=utf-8`.
+  bool declaresCharset = false;
+  /// The address in `wsp:AppliesTo`: the service for which the token is. Not written if none.
+  boost::optional<std::string> appliesTo;
+  /// Whether the header has the elements of WS-Addressing 1.0; signed when the message is.
+  bool addressing = false;
+  Statement delegatable = Statement::ALWAYS;       ///< `wst:Delegatable`
+  Statement renewing = Statement::ALWAYS;          ///< `wst:Renewing`
+  UseKey useKey = UseKey::REFERENCE;               ///< `wst:UseKey`
+  Delegation delegation = Delegation::DELEGATE_TO; ///< for `TokenSpec::delegateTo`
+  /// The type of token in a request; empty for "urn:oasis:names:tc:SAML:2.0:assertion".
+  std::string tokenType;
+  /// Whether a reference to a SAML token has the token type of the WS-Security SAML Token Profile 1.1 in its published
+  /// spelling, "oasis-wss-saml-token-profile-1.1", which the Basic Security Profile demands.
+  bool standardTokenTypeReference = false;
+  /// Faults that also mean that the service refuses the caller's credentials.
+  std::vector<FaultName> credentialFaults;
+  /// Whether a response is found inside and outside a collection, whatever the operation.
+  bool acceptsAnyResponse = false;
+};
+
+/// The dialect of that name. The names are those of `GetDialectNames`.
+/// @throws Tarvel::InvalidArgumentException for another name. The message lists the names.
+SSOCLIENT_API ServiceDialect GetServiceDialect(const std::string &name);
+
+/// The names of the dialects that are known: "default", and one for each service with which this client is tested.
+SSOCLIENT_API std::vector<std::string> GetDialectNames();
+
+/// Checks a dialect. `CreateSecurityTokenService` calls it.
+/// @throws Tarvel::InvalidArgumentException when a text that must be an absolute URI is none, when a fault has no name,
+///         and when two switches contradict each other. The message says which.
+SSOCLIENT_API void CheckServiceDialect(const ServiceDialect &dialect);
+
+} // namespace SsoClient

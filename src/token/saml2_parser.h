@@ -1,0 +1,19 @@
+// SPDX-License-Identifier: Apache-2.0
+/// @file
+/// `ParseSaml2AssertionElement`, the reader of the profile SAML2.
+
+#pragma once
+
+#include "token/saml2_model.h"
+#include "xml/deviation_sink.h"
+#include "xml/node_filter_iterator.h"
+
+namespace SsoClient {
+
+/// Reads the assertion at the cursor and moves the cursor to the next node. Accepts what SAML 2.0 core lets an issuer of
+/// authentication and attribute assertions write, and everything that `ParseSamlAssertionElement` accepts. What is not
+/// accepted is reported to `sink`, with which the parse continues in the same way.
+void ParseSaml2AssertionElement(NodeFilterIterator &iterator, Saml2Assertion &assertion,
+                                DeviationSink &sink = ThrowingSink());
+
+} // namespace SsoClient
