@@ -53,9 +53,10 @@ void ParseMethod(const ElementNode &element, Saml2Confirmation &confirmation, Co
   confirmation.type = FindConfirmationType(details.method);
 }
 
-/// Reads the content of the data of a known method. Other elements than a key may be there, and are ignored.
+/// Reads the content of the data of a known method: the first key. Other elements may be there, and are ignored.
 void ParseContent(NodeFilterIterator child, SamlToken::ConfirmationType type, ConfirmationDetails &details,
                   DeviationSink &sink) {
+  bool isKeyRead = false;
   while (child.node) {
     const ElementNode *const element = IteratorToElement(child);
     const bool isKeyInfo = ElementQNameIs(element, "KeyInfo", Namespaces::DS);
@@ -66,8 +67,8 @@ void ParseContent(NodeFilterIterator child, SamlToken::ConfirmationType type, Co
     if (isKeyInfo && type == SamlToken::BEARER) {
       Refuse(sink, child, "no key", WhatIsAt{element}, "A bearer confirmation must not have a key: '%1'",
              element->GetName());
-    } else if (isKeyInfo && details.publicKey.empty()) {
-      ParseKeyInfo(child, details, sink);
+    } else if (isKeyInfo && !isKeyRead) {
+      isKeyRead = ParseKeyInfo(child, details, sink);
     }
     child.MoveToSibling();
   }
