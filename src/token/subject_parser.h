@@ -8,6 +8,8 @@
 #include "xml/deviation_sink.h"
 #include "xml/node_filter_iterator.h"
 
+#include <string_view>
+
 namespace SsoClient {
 
 /// Reads attributes and text of an element of the type NameIDType, whatever its name. The cursor must be on an element.
@@ -25,6 +27,9 @@ void ParseSubjectElement(NodeFilterIterator &iterator, SubjectType &subject, Dev
 /// Reads a `saml:SubjectConfirmation` of the method bearer or holder-of-key.
 void ParseSubjectConfirmationElement(NodeFilterIterator &iterator, SubjectConfirmationType &confirmation,
                                      DeviationSink &sink = ThrowingSink());
+
+/// Refuses the `Method` of a `saml:SubjectConfirmation`, which is not known.
+void RefuseMethod(const Tarvel::Xml::ElementNode &confirmation, std::string_view method, DeviationSink &sink);
 
 /// Reads a `saml:SubjectConfirmationData`, whose form depends on `method`: bearer has an end of validity, holder-of-key a
 /// certificate.
