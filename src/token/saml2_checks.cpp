@@ -234,7 +234,7 @@ void ConfirmationChoice::Check(std::size_t index, DeviationSink &sink) const {
   const Saml2Confirmation &confirmation = m_assertion.confirmations[index];
   const ConfirmationDetails &details = m_assertion.details.confirmations[index];
   if (!confirmation.type) {
-    RefuseMethod(*confirmation.element, details.method, sink);
+    RefuseMethod(confirmation.element, details.method, sink);
     return;
   }
   if (!IsConsidered(index)) {

@@ -43,7 +43,7 @@ void ParseMethod(const ElementNode &element, SubjectConfirmationType &confirmati
   if (confirmation.isMethodKnown) {
     confirmation.Method = method == METHOD_BEARER ? SamlToken::BEARER : SamlToken::HOLDER_OF_KEY;
   } else {
-    RefuseMethod(element, method, sink);
+    RefuseMethod(&element, method, sink);
   }
 }
 
@@ -116,7 +116,7 @@ void ParseHolderOfKeyData(const NodeFilterIterator &data, Ref<const Certificate>
 
 } // namespace
 
-void RefuseMethod(const ElementNode &confirmation, std::string_view method, DeviationSink &sink) {
+void RefuseMethod(const ElementNode *confirmation, std::string_view method, DeviationSink &sink) {
   Refuse(sink, {confirmation, "Method"}, METHODS, method, "Unknown subject confirmation method: '%1'", method);
 }
 

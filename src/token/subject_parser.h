@@ -28,8 +28,8 @@ void ParseSubjectElement(NodeFilterIterator &iterator, SubjectType &subject, Dev
 void ParseSubjectConfirmationElement(NodeFilterIterator &iterator, SubjectConfirmationType &confirmation,
                                      DeviationSink &sink = ThrowingSink());
 
-/// Refuses the `Method` of a `saml:SubjectConfirmation`, which is not known.
-void RefuseMethod(const Tarvel::Xml::ElementNode &confirmation, std::string_view method, DeviationSink &sink);
+/// Refuses the `Method` of `confirmation`, a `saml:SubjectConfirmation`, because it is not known.
+void RefuseMethod(const Tarvel::Xml::ElementNode *confirmation, std::string_view method, DeviationSink &sink);
 
 /// Reads a `saml:SubjectConfirmationData`, whose form depends on `method`: bearer has an end of validity, holder-of-key a
 /// certificate.
