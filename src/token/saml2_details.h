@@ -9,14 +9,21 @@
 #include <ssoclient/token_details.h>
 #include <tarvel/xml/node.h>
 
+#include <cstddef>
 #include <vector>
 
 namespace SsoClient {
+
+/// The maximum number of bytes of all attribute values that contain elements.
+constexpr std::size_t MAX_XML_VALUE_BYTES = 32u * 1024 * 1024;
 
 /// The identifier in `element`, which a parser has accepted.
 NameId ReadNameId(const Tarvel::Xml::ElementNode &element);
 
 /// The attributes of `statement`, which a parser has accepted, with the values that are XML.
+/// @throws ParseException when these values are longer than `MAX_XML_VALUE_BYTES`.
+/// @throws Tarvel::Xml::Security::XmlSecurityException when such a value has no canonical form. An assertion with a valid
+///         signature has one.
 std::vector<SamlAttribute> ReadAttributes(const AttributeStatementType &statement);
 
 } // namespace SsoClient
