@@ -64,7 +64,9 @@ struct ConfirmationDetails {
   boost::optional<std::string> inResponseTo;              ///< the identifier of the request that this answers
   boost::optional<std::string> address;                   ///< the network address of the sender
   Tarvel::Ref<const Tarvel::Crypto::Certificate> certificate; ///< of a holder of key; null if only a key is stated
-  std::vector<std::uint8_t> publicKey; ///< of a holder of key: SubjectPublicKeyInfo in DER; empty for other methods
+  /// Of a holder of key: SubjectPublicKeyInfo in DER. Empty for other methods, and if no key can be used: there is none, or
+  /// a key value that is neither RSA with 2048 to 16384 bits nor on the curves P-256, P-384 and P-521.
+  std::vector<std::uint8_t> publicKey;
 };
 
 /// How and when the subject authenticated (SAML 2.0 core, section 2.7.2).
