@@ -5,7 +5,7 @@
 #include "support/recorded_deviations.h"
 #include "support/throws_message.h"
 #include "token/saml2_checks.h"
-#include "unit/token/saml2_assertion.h"
+#include "unit/token/saml2_records.h"
 
 #include <ssoclient/exceptions.h>
 #include <tarvel/core/string_util.h>

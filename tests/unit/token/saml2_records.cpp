@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 
-#include "unit/token/saml2_assertion.h"
+#include "unit/token/saml2_records.h"
 
 #include "support/parsed_document.h"
 #include "unit/token/signed_assertion.h"
