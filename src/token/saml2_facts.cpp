@@ -150,8 +150,10 @@ void TakeSaml2Conditions(const Saml2Assertion &assertion, TokenFacts &facts) {
   TakePermissions(conditions, facts);
   if (conditions.DelegationRestriction) {
     for (const DelegateType &delegate : conditions.DelegationRestriction->delegates) {
-      facts.delegationChain.push_back(
-          {ToPrincipalId(ReadNameId(*delegate.NameID.element)), delegate.DelegationInstant});
+      if (delegate.NameID.element) {
+        facts.delegationChain.push_back(
+            {ToPrincipalId(ReadNameId(*delegate.NameID.element)), delegate.DelegationInstant});
+      }
     }
   }
 }

@@ -301,6 +301,14 @@ TEST(TakeSaml2Facts, TakesEachDelegateWithItsQualifiers) {
   EXPECT_EQ(ToPrincipalId(DELEGATE), facts.delegationChain[1].subject);
 }
 
+TEST(TakeSaml2Facts, LeavesOutADelegateWithoutAName) {
+  Saml2Assertion assertion = Delegated({}, {SUBJECT, DELEGATE});
+  assertion.common.Conditions.DelegationRestriction->delegates[0].NameID = NameIDType();
+  const TokenFacts facts = FactsOfAssertion(assertion);
+  ASSERT_EQ(1u, facts.delegationChain.size());
+  EXPECT_EQ(ToPrincipalId(DELEGATE), facts.delegationChain[0].subject);
+}
+
 TEST(TakeSaml2Facts, TakesAGroupWithAndWithoutADomain) {
   const TokenFacts facts = FactsOfAssertion(WithAttribute(GROUP, {"users", "CORP\\admins", "a@b", "A\\B\\C"}));
   std::vector<std::string> groups;
