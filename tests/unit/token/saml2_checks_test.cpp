@@ -409,6 +409,20 @@ TEST_F(ChooseConfirmationTest, SetsTheConfirmationOfTheSubject) {
   EXPECT_EQ(chosen.details.certificate, used.SubjectConfirmationData.certificate);
 }
 
+TEST_F(ChooseConfirmationTest, LeavesNothingOfAConfirmationThatWasChosenBefore) {
+  Confirmation first = HolderOfKey();
+  first.details.nameId = DELEGATE;
+  Saml2Assertion assertion = AssertionWith({first, Bearer()});
+  VerifyOptions options;
+  options.requiredConfirmation = SamlToken::HOLDER_OF_KEY;
+  EXPECT_TRUE(ChooseConfirmation(assertion, options, AtSecond(0), ThrowingSink()));
+  EXPECT_TRUE(assertion.common.Subject.SubjectConfirmation.NameID);
+  EXPECT_TRUE(ChooseConfirmation(assertion, {}, AtSecond(0), ThrowingSink()));
+  EXPECT_EQ(1u, assertion.details.usedConfirmation);
+  EXPECT_FALSE(assertion.common.Subject.SubjectConfirmation.NameID);
+  EXPECT_EQ(nullptr, assertion.common.Subject.SubjectConfirmation.SubjectConfirmationData.certificate);
+}
+
 TEST_F(CheckSaml2ValidityTest, IsThatOfTheProfileStrict) {
   for (const auto &[from, to] : std::vector<std::pair<int, int>>{
            {600, 3600}, {601, 3600}, {-3600, -599}, {-3600, -600}, {10, 10}, {11, 10}, {601, -600}}) {
