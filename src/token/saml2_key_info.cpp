@@ -95,51 +95,75 @@ SubjectPublicKey ParseEcKeyValue(const NodeFilterIterator &keyValue, DeviationSi
   return {};
 }
 
-SubjectPublicKey ParseKeyValue(const NodeFilterIterator &iterator, DeviationSink &sink) {
-  const NodeFilterIterator child = iterator.GetChild();
-  const ElementNode *const element = IteratorToElement(child);
-  if (ElementQNameIs(element, "RSAKeyValue", Namespaces::DS)) {
-    return ParseRsaKeyValue(child, sink);
+/// A cursor on the first child of the element at `parent` for which `isWanted` is true; past the end if there is none.
+template <typename IsWanted>
+NodeFilterIterator FindChild(const NodeFilterIterator &parent, const IsWanted &isWanted) {
+  NodeFilterIterator child = parent.GetChild();
+  while (child.node && !isWanted(child)) {
+    child.MoveToSibling();
   }
-  return ElementQNameIs(element, "ECKeyValue", Namespaces::DSIG11) ? ParseEcKeyValue(child, sink) : SubjectPublicKey();
+  return child;
 }
 
-/// Reads the first certificate in the `ds:X509Data` at the cursor.
-void ParseCertificate(const NodeFilterIterator &iterator, Ref<const Certificate> &certificate, DeviationSink &sink) {
-  for (NodeFilterIterator child = iterator.GetChild(); child.node && !certificate; child.MoveToSibling()) {
-    if (ElementQNameIs(IteratorToElement(child), "X509Certificate", Namespaces::DS)) {
-      ParseX509CertificateElement(child, certificate, sink);
-      return;
-    }
+bool IsSignatureElement(const NodeFilterIterator &iterator, std::string_view localName) {
+  return ElementQNameIs(IteratorToElement(iterator), localName, Namespaces::DS);
+}
+
+NodeFilterIterator FindCertificate(const NodeFilterIterator &iterator) {
+  const auto inData = [](const NodeFilterIterator &data) {
+    return FindChild(data, [](const auto &child) { return IsSignatureElement(child, "X509Certificate"); });
+  };
+  const NodeFilterIterator data = FindChild(
+      iterator, [&](const auto &child) { return IsSignatureElement(child, "X509Data") && inData(child).node; });
+  return data.node ? inData(data) : data;
+}
+
+bool IsRsaKeyValue(const NodeFilterIterator &iterator) {
+  return IsSignatureElement(iterator, "RSAKeyValue");
+}
+
+bool IsEcKeyValue(const NodeFilterIterator &iterator) {
+  return ElementQNameIs(IteratorToElement(iterator), "ECKeyValue", Namespaces::DSIG11);
+}
+
+NodeFilterIterator FindKeyValue(const NodeFilterIterator &iterator) {
+  return FindChild(iterator,
+                   [](const NodeFilterIterator &child) {
+                     const NodeFilterIterator value = child.GetChild();
+                     return IsSignatureElement(child, "KeyValue") && (IsRsaKeyValue(value) || IsEcKeyValue(value));
+                   })
+      .GetChild();
+}
+
+SubjectPublicKey ParseKeyValue(const NodeFilterIterator &value, DeviationSink &sink) {
+  if (!value.node) {
+    return {};
   }
+  return IsRsaKeyValue(value) ? ParseRsaKeyValue(value, sink) : ParseEcKeyValue(value, sink);
 }
 
 } // namespace
 
-void ParseKeyInfo(const NodeFilterIterator &iterator, ConfirmationDetails &details, DeviationSink &sink) {
+bool ParseKeyInfo(const NodeFilterIterator &iterator, ConfirmationDetails &details, DeviationSink &sink) {
   RequireSchemaAttributes(*IteratorToElement(iterator), {{Namespaces::DS, "KeyInfoType"}}, {}, {LocalName("Id")}, sink);
+  NodeFilterIterator certificateElement = FindCertificate(iterator);
+  const NodeFilterIterator keyValueElement = FindKeyValue(iterator);
+  const bool hasKey = certificateElement.node || keyValueElement.node;
   Ref<const Certificate> certificate;
-  std::optional<SubjectPublicKey> keyValue;
-  for (NodeFilterIterator child = iterator.GetChild(); child.node; child.MoveToSibling()) {
-    const ElementNode *const element = IteratorToElement(child);
-    if (!certificate && ElementQNameIs(element, "X509Data", Namespaces::DS)) {
-      ParseCertificate(child, certificate, sink);
-    } else if (!keyValue && ElementQNameIs(element, "KeyValue", Namespaces::DS)) {
-      keyValue = ParseKeyValue(child, sink);
-    }
+  if (certificateElement.node) {
+    ParseX509CertificateElement(certificateElement, certificate, sink);
   }
-  const bool hasKeyValue = keyValue && !keyValue->der.empty();
-  if (certificate && hasKeyValue && !Tarvel::Crypto::HasPublicKey(*certificate, keyValue->der)) {
+  SubjectPublicKey keyValue = ParseKeyValue(keyValueElement, sink);
+  if (certificate && !keyValue.der.empty() && !Tarvel::Crypto::HasPublicKey(*certificate, keyValue.der)) {
     Refuse(sink, iterator, "one key", "two keys",
            "The certificate and the key value of a confirmation are different keys");
-    return;
-  }
-  if (certificate) {
+  } else if (certificate) {
     details.publicKey = Tarvel::Crypto::GetSubjectPublicKey(*certificate);
     details.certificate = std::move(certificate);
-  } else if (hasKeyValue && keyValue->refusal.empty()) {
-    details.publicKey = std::move(keyValue->der);
+  } else if (keyValue.refusal.empty()) {
+    details.publicKey = std::move(keyValue.der);
   }
+  return hasKey;
 }
 
 } // namespace SsoClient

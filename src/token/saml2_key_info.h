@@ -15,9 +15,12 @@ namespace SsoClient {
 /// (`RSAKeyValue`, or `ECKeyValue` with a named curve). If both are there, they must be the same. Everything else in a
 /// `ds:KeyInfo` is ignored.
 ///
-/// If there is no key, or a key value of a kind or size with which no signature is accepted, `details.publicKey` stays
+/// If there is no key, or a key value of a size or a curve with which no signature is accepted, `details.publicKey` stays
 /// empty. The key of a certificate may have any kind and size, as in the profile STRICT.
-void ParseKeyInfo(const NodeFilterIterator &iterator, ConfirmationDetails &details,
+///
+/// Returns whether there is a certificate or such a key value, even if it is refused. Keys take long to read, so the
+/// caller should not read another `ds:KeyInfo` then.
+bool ParseKeyInfo(const NodeFilterIterator &iterator, ConfirmationDetails &details,
                   DeviationSink &sink = ThrowingSink());
 
 } // namespace SsoClient

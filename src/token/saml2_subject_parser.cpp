@@ -53,23 +53,19 @@ void ParseMethod(const ElementNode &element, Saml2Confirmation &confirmation, Co
   confirmation.type = FindConfirmationType(details.method);
 }
 
-/// Reads the content of the data of a known method. Other elements than a key may be there, and are ignored.
+/// Reads the content of the data of a known method: the first key. The standard allows any elements and text, and
+/// everything else is ignored.
 void ParseContent(NodeFilterIterator child, SamlToken::ConfirmationType type, ConfirmationDetails &details,
                   DeviationSink &sink) {
-  while (child.node) {
+  for (bool isKeyRead = false; child.node; child.MoveToSibling()) {
     const ElementNode *const element = IteratorToElement(child);
     const bool isKeyInfo = ElementQNameIs(element, "KeyInfo", Namespaces::DS);
-    if (!element) {
-      RefuseContent(child, "elements", sink);
-      continue;
-    }
     if (isKeyInfo && type == SamlToken::BEARER) {
       Refuse(sink, child, "no key", WhatIsAt{element}, "A bearer confirmation must not have a key: '%1'",
              element->GetName());
-    } else if (isKeyInfo && details.publicKey.empty()) {
-      ParseKeyInfo(child, details, sink);
+    } else if (isKeyInfo && !isKeyRead) {
+      isKeyRead = ParseKeyInfo(child, details, sink);
     }
-    child.MoveToSibling();
   }
 }
 

@@ -142,7 +142,7 @@ TEST(ParseSaml2AssertionElement, ReadsTheDataOfABearerConfirmation) {
   const Accepted read = AcceptedSaml2(AssertionConfirmedBy(Piece::Confirmation(
       "bearer", "<saml:SubjectConfirmationData NotBefore='2026-01-01T00:00:01Z' NotOnOrAfter='2026-01-01T08:00:00Z' "
                 "Recipient='https://r/' InResponseTo='_i' Address='192.0.2.1' xml:lang='en' xmlns:x='urn:x' x:any='1'>"
-                "<other/><x:more>text</x:more></saml:SubjectConfirmationData>")));
+                "text<other/><x:more>text</x:more></saml:SubjectConfirmationData>")));
   ASSERT_THAT(read.details.confirmations, SizeIs(1));
   const ConfirmationDetails &details = read.details.confirmations[0];
   EXPECT_EQ("urn:oasis:names:tc:SAML:2.0:cm:bearer", details.method);

@@ -121,6 +121,15 @@ TEST(RequireElementAttributesQNames, ReportsUnexpectedThenMissingAttributesAndUn
       }));
 }
 
+TEST(RequireElementAttributesQNames, IgnoresUnexpectedAttributesOfTheGivenNames) {
+  const ParsedDocument document("<r xmlns:a='urn:a' a:x='1' x='2'/>");
+  EXPECT_EQ((Deviations{{"Unexpected attribute 'x' on element 'r'", "r", "x", "no attributes", "2"}}),
+            DeviationsOf([&](DeviationSink &sink) {
+              RequireElementAttributesQNames(document.Root(), {}, {}, sink,
+                                             [](const QNameView &name) { return name == QNameView("urn:a", "x"); });
+            }));
+}
+
 Deviations ReportOfText(const std::string &content) {
   const ParsedDocument document("<r>" + content + "</r>");
   return DeviationsOf([&](DeviationSink &sink) {
@@ -151,7 +160,7 @@ TEST(GetDateAttribute, ReportsATextThatIsNotADateAndKeepsTheDate) {
             DeviationsOf([&](DeviationSink &sink) {
               DateTime date("2001-01-01T00:00:00Z");
               RecordedDeviations other;
-              GetDateAttribute(document.Root(), "At", date, other);
+              EXPECT_FALSE(GetDateAttribute(document.Root(), "At", date, other));
               EXPECT_EQ(DateTime("2001-01-01T00:00:00Z"), date);
               GetDateAttribute(document.Root(), "At", date, sink);
             }));
@@ -161,9 +170,16 @@ TEST(GetDateAttribute, DoesNotReportAMissingAttributeAgain) {
   const ParsedDocument document("<r/>");
   DateTime date("2001-01-01T00:00:00Z");
   RecordedDeviations sink;
-  GetDateAttribute(document.Root(), "At", date, sink);
+  EXPECT_FALSE(GetDateAttribute(document.Root(), "At", date, sink));
   EXPECT_TRUE(sink.all.empty());
   EXPECT_EQ(DateTime("2001-01-01T00:00:00Z"), date);
+}
+
+TEST(GetDateAttribute, ReturnsWhetherTheDateWasRead) {
+  const ParsedDocument document("<r At='2026-01-01T00:00:00Z'/>");
+  DateTime date;
+  EXPECT_TRUE(GetDateAttribute(document.Root(), "At", date, ThrowingSink()));
+  EXPECT_EQ(DateTime("2026-01-01T00:00:00Z"), date);
 }
 
 TEST(GetBoolAttribute, ReportsATextThatIsNotABooleanAndKeepsTheFlag) {
