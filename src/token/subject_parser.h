@@ -12,7 +12,6 @@
 
 #include <boost/optional.hpp>
 
-
 #include <string_view>
 
 namespace SsoClient {
