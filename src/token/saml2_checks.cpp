@@ -95,9 +95,7 @@ private:
 void UseConfirmation(Saml2Assertion &assertion, std::size_t index) {
   const Saml2Confirmation &confirmation = assertion.confirmations[index];
   const ConfirmationDetails &details = assertion.details.confirmations[index];
-  SubjectConfirmationType &used = assertion.common.Subject.SubjectConfirmation;
-  assertion.details.usedConfirmation = index;
-  used = SubjectConfirmationType();
+  SubjectConfirmationType used;
   used.Method = *confirmation.type;
   used.isMethodKnown = true;
   used.element = confirmation.element;
@@ -111,6 +109,8 @@ void UseConfirmation(Saml2Assertion &assertion, std::size_t index) {
   used.SubjectConfirmationData.element = confirmation.data;
   used.SubjectConfirmationData.NotOnOrAfter = details.notOnOrAfter.value_or(DateTime());
   used.SubjectConfirmationData.certificate = details.certificate;
+  assertion.common.Subject.SubjectConfirmation = std::move(used);
+  assertion.details.usedConfirmation = index;
 }
 
 } // namespace

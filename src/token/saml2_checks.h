@@ -51,7 +51,7 @@ void CheckSessions(const Saml2Assertion &assertion, std::int64_t clockToleranceS
 /// or, if there is no restriction, the subject itself.
 void CheckSaml2Delegation(const Saml2Assertion &assertion, DeviationSink &sink);
 
-/// Decides which confirmations of an assertion can be used. The arguments must outlive it.
+/// Decides which confirmations of an assertion can be used. The assertion and the options must outlive it.
 class ConfirmationChoice {
 public:
   ConfirmationChoice(const Saml2Assertion &assertion, const VerifyOptions &options,
@@ -79,7 +79,7 @@ private:
 
   const Saml2Assertion &m_assertion;
   const VerifyOptions &m_options;
-  const Tarvel::System::DateTime &m_now;
+  const Tarvel::System::DateTime m_now;
   boost::optional<SamlToken::ConfirmationType> m_onlyType; // empty: all are considered
 };
 

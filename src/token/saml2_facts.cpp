@@ -50,6 +50,8 @@ bool IsWrittenAsItIs(char octet) {
 
 void AppendEncoded(std::string &text, std::string_view value) {
   constexpr std::string_view DIGITS = "0123456789ABCDEF";
+  const auto plain = static_cast<std::size_t>(std::count_if(value.begin(), value.end(), IsWrittenAsItIs));
+  text.reserve(text.size() + 3 * value.size() - 2 * plain); // exactly, because a qualifier may be very long
   for (const char octet : value) {
     if (IsWrittenAsItIs(octet)) {
       text += octet;
@@ -149,9 +151,12 @@ void TakeSaml2Conditions(const Saml2Assertion &assertion, TokenFacts &facts) {
   facts.endDate = period.end;
   TakePermissions(conditions, facts);
   if (conditions.DelegationRestriction) {
+    facts.delegationChain.reserve(conditions.DelegationRestriction->delegates.size());
     for (const DelegateType &delegate : conditions.DelegationRestriction->delegates) {
-      facts.delegationChain.push_back(
-          {ToPrincipalId(ReadNameId(*delegate.NameID.element)), delegate.DelegationInstant});
+      if (delegate.NameID.element) {
+        facts.delegationChain.push_back(
+            {ToPrincipalId(ReadNameId(*delegate.NameID.element)), delegate.DelegationInstant});
+      }
     }
   }
 }
