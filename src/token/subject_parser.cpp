@@ -41,7 +41,7 @@ void ParseMethod(const ElementNode &element, SubjectConfirmationType &confirmati
   if (type) {
     confirmation.Method = *type;
   } else {
-    Refuse(sink, {element, "Method"}, METHODS, method, "Unknown subject confirmation method: '%1'", method);
+    RefuseMethod(&element, method, sink);
   }
 }
 
@@ -99,6 +99,10 @@ void ParseHolderOfKeyData(const NodeFilterIterator &data, Ref<const Certificate>
 }
 
 } // namespace
+
+void RefuseMethod(const ElementNode *confirmation, std::string_view method, DeviationSink &sink) {
+  Refuse(sink, {confirmation, "Method"}, METHODS, method, "Unknown subject confirmation method: '%1'", method);
+}
 
 boost::optional<SamlToken::ConfirmationType> FindConfirmationType(std::string_view method) {
   if (method == METHOD_BEARER) {

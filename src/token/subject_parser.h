@@ -14,6 +14,8 @@
 
 #include <string_view>
 
+#include <string_view>
+
 namespace SsoClient {
 
 /// The type of `SubjectConfirmationData` with a key.
@@ -37,6 +39,9 @@ void ParseSubjectElement(NodeFilterIterator &iterator, SubjectType &subject, Dev
 /// Reads a `saml:SubjectConfirmation` of the method bearer or holder-of-key.
 void ParseSubjectConfirmationElement(NodeFilterIterator &iterator, SubjectConfirmationType &confirmation,
                                      DeviationSink &sink = ThrowingSink());
+
+/// Refuses the `Method` of `confirmation`, a `saml:SubjectConfirmation`, because it is not known.
+void RefuseMethod(const Tarvel::Xml::ElementNode *confirmation, std::string_view method, DeviationSink &sink);
 
 /// Reads a `saml:SubjectConfirmationData`, whose form depends on `method`: bearer has an end of validity, holder-of-key a
 /// certificate.
