@@ -34,8 +34,10 @@ ExitCode Validate(const ValidateOptions &options, const OutputOptions &output) {
   CheckConnection(options.connection);
 
   const Tarvel::Crypto::CertificateList trusted = LoadTrusted(options.trust, output);
-  const auto token = ReadToken(options.file, trusted, options.trust.toleranceSec);
-  const auto service = CreateService(options.connection, trusted, boost::none, {{}, ObserverFor(output), {}});
+  const auto token = ReadToken(options.file, trusted, VerifyOptionsOf(options.trust));
+  ServiceOptions serviceOptions;
+  serviceOptions.observer = ObserverFor(output);
+  const auto service = CreateService(options.connection, trusted, boost::none, serviceOptions);
   const bool isValid = CallService([&] { return service->ValidateSubject(*token); });
   WriteOutput(RenderVerdict(isValid, output.format));
   return isValid ? ExitCode::DONE : ExitCode::TOKEN_INVALID;
