@@ -72,7 +72,9 @@ public:
   /// The same, returned.
   std::vector<Delegate> GetDelegationChain() const;
 
-  /// Sets `audience` to the audiences to which the token is restricted. Empty means no restriction.
+  /// Sets `audience` to the audiences to which the token is restricted. Empty means no restriction. With several restrictions
+  /// (only in the profile SAML2), these are the audiences that all of them name; if there is none, the only entry is a
+  /// text that names the restrictions and is not the address of any service.
   virtual void GetAudience(std::set<std::string> &audience) const = 0;
 
   /// The same, returned.
@@ -84,7 +86,9 @@ public:
   /// The same, returned.
   std::vector<Advice> GetAdvice() const;
 
-  /// The certificate of a holder-of-key token: its sender must prove possession of the private key. Null for a bearer token.
+  /// The certificate of a holder-of-key token: its sender must prove possession of the private key. Null for a bearer
+  /// token, and for a holder-of-key token that states a key without a certificate. Only the profile SAML2 accepts such a
+  /// token; `GetTokenDetails` has its key.
   virtual const Tarvel::Crypto::Certificate *GetConfirmationCertificate() const = 0;
 
   /// The token's XML, which can be sent to a service. The XML of a bearer token is secret: anyone who has it can use

@@ -102,6 +102,7 @@ struct TokenDetails {
 /// All that the token states. Reads the token's text again, which takes about as long as parsing it.
 /// @param token made by this library
 /// @throws Tarvel::InvalidArgumentException for an implementation of `SamlToken` that is not this library's.
+/// @throws ParseException when the attribute values that contain elements take more than 32 MiB in canonical form.
 /// @throws Tarvel::OutOfMemoryException or std::bad_alloc when memory runs out.
 SSOCLIENT_API TokenDetails GetTokenDetails(const SamlToken &token);
 

@@ -20,7 +20,15 @@ constexpr std::int64_t DEFAULT_CLOCK_TOLERANCE_SEC = 600;
 /// The form of assertion that is accepted.
 enum class TokenProfile : std::int32_t {
   STRICT = 0, ///< the form that the token service issues: its elements and attributes in their order, and no others
-  SAML2 ///< what SAML 2.0 core lets an issuer of authentication and attribute assertions write; reads all that STRICT reads
+
+  /// What SAML 2.0 core lets an issuer of authentication and attribute assertions write. Reads all that STRICT reads.
+  ///
+  /// An identifier that is not of the form `name@domain` becomes a principal whose domain begins with "nameid:" and
+  /// states the format and the qualifiers; `docs/interoperate.md` has the table. Where a format is case-sensitive, such as
+  /// persistent and transient, compare `GetNameId`: `PrincipalId` ignores letter case.
+  ///
+  /// A token is valid while its conditions hold, the confirmation that is used can be used, and no session in it has ended.
+  SAML2
 };
 
 /// What is checked of a token, in addition to its form, its consistency and its signature. The defaults are those of

@@ -23,6 +23,7 @@ constexpr std::string_view WSS4J = "http://ws.apache.org/wss4j";
 constexpr std::string_view WSA = "http://www.w3.org/2005/08/addressing";
 constexpr std::string_view SAML = "urn:oasis:names:tc:SAML:2.0:assertion";
 constexpr std::string_view DS = "http://www.w3.org/2000/09/xmldsig#";
+constexpr std::string_view DSIG11 = "http://www.w3.org/2009/xmldsig11#";
 constexpr std::string_view XS = "http://www.w3.org/2001/XMLSchema";
 constexpr std::string_view XSI = "http://www.w3.org/2001/XMLSchema-instance";
 constexpr std::string_view DELEGATION = "urn:oasis:names:tc:SAML:2.0:conditions:delegation";

@@ -13,25 +13,10 @@
 
 namespace SsoClient {
 
-namespace {
-
 using Tarvel::Xml::ElementNode;
 using Tarvel::Xml::Node;
 
-/// The first SAML 2.0 assertion in the tree of `top` or, if there is none, the first "Assertion" in any namespace.
-const ElementNode *FindAssertion(const Node *top) {
-  const ElementNode *inOtherNamespace = nullptr;
-  for (const Node *node = top; node; node = NextInTree(node, top)) {
-    const ElementNode *const element = Tarvel::Xml::AsElement(node);
-    if (ElementQNameIs(element, "Assertion", Namespaces::SAML)) {
-      return element;
-    }
-    if (!inOtherNamespace && element && element->GetLocalName() == "Assertion") {
-      inOtherNamespace = element;
-    }
-  }
-  return inOtherNamespace;
-}
+namespace {
 
 /// Reads the attribute statement at the cursor, or an advice that is not in its place, and skips any other node.
 void ReadAttributesOrAdvice(NodeFilterIterator &iterator, SamlAssertionType &assertion, DeviationSink &sink) {
@@ -80,6 +65,20 @@ void ParseAssertion(const NodeFilterIterator &iterator, const ElementNode &eleme
 }
 
 } // namespace
+
+const ElementNode *FindAssertion(const Node *top) {
+  const ElementNode *inOtherNamespace = nullptr;
+  for (const Node *node = top; node; node = NextInTree(node, top)) {
+    const ElementNode *const element = Tarvel::Xml::AsElement(node);
+    if (ElementQNameIs(element, "Assertion", Namespaces::SAML)) {
+      return element;
+    }
+    if (!inOtherNamespace && element && element->GetLocalName() == "Assertion") {
+      inOtherNamespace = element;
+    }
+  }
+  return inOtherNamespace;
+}
 
 void ParseSamlAssertionElement(NodeFilterIterator &iterator, SamlAssertionType &assertion, DeviationSink &sink) {
   const bool isAssertion = RequireElementQName(iterator, "Assertion", Namespaces::SAML, sink);

@@ -2,11 +2,9 @@
 
 #include "token/conditions_parser.h"
 
-#include "model/namespaces.h"
 #include "token/subject_parser.h"
 #include "xml/expected_element.h"
 #include "xml/form_text.h"
-#include "xml/qualified_name.h"
 #include "xml/refuse.h"
 #include "xml/strict_checks.h"
 
@@ -19,9 +17,6 @@ namespace SsoClient {
 namespace {
 
 using Tarvel::Xml::ElementNode;
-
-constexpr QNameView DELEGATION_RESTRICTION_TYPE(Namespaces::DELEGATION, "DelegationRestrictionType");
-constexpr QNameView RENEW_RESTRICTION_TYPE(Namespaces::RSA_SAML2, "RenewRestrictionType");
 
 constexpr std::string_view RESTRICTIONS = "saml:AudienceRestriction, saml:ProxyRestriction, and saml:Condition of the "
                                           "types del:DelegationRestrictionType and "
@@ -113,7 +108,8 @@ void ParseConditionsElement(NodeFilterIterator &iterator, ConditionsType &condit
 }
 
 bool TryParseDelegationRestriction(NodeFilterIterator &iterator,
-                                   boost::optional<DelegationRestrictionType> &restriction, DeviationSink &sink) {
+                                   boost::optional<DelegationRestrictionType> &restriction, DeviationSink &sink,
+                                   DelegateParser parseDelegate) {
   const ElementNode *const element = ConditionOfType(iterator, DELEGATION_RESTRICTION_TYPE, sink);
   if (!element) {
     return false;
@@ -122,7 +118,7 @@ bool TryParseDelegationRestriction(NodeFilterIterator &iterator,
   restriction.emplace();
   NodeFilterIterator child = iterator.GetChild();
   do {
-    if (!ParseDelegate(child, restriction->delegates.emplace_back(), sink)) {
+    if (!parseDelegate(child, restriction->delegates.emplace_back(), sink)) {
       restriction->delegates.pop_back();
     }
   } while (child.node);

@@ -5,10 +5,18 @@
 #pragma once
 
 #include "token/token_facts.h"
+#include "xml/node_filter_iterator.h"
 
 #include <ssoclient/saml_token.h>
+#include <ssoclient/token_details.h>
+#include <ssoclient/verify_options.h>
 #include <tarvel/xml/security/key_info_resolver.h>
 #include <tarvel/xml/security/signature.h>
+
+#include <boost/optional.hpp>
+
+#include <cstddef>
+#include <string>
 
 namespace SsoClient {
 
@@ -19,11 +27,11 @@ class SamlTokenImpl final : public SamlToken {
 public:
   /// From a text, which `ToXml` returns unchanged.
   SamlTokenImpl(const std::string &xml, const Tarvel::Xml::Security::KeyInfoResolver &resolver,
-                std::int64_t clockToleranceSec);
+                const VerifyOptions &options);
 
   /// From an element. `ToXml` returns its canonical form.
   SamlTokenImpl(const Tarvel::Xml::ElementNode &element, const Tarvel::Xml::Security::KeyInfoResolver &resolver,
-                std::int64_t clockToleranceSec);
+                const VerifyOptions &options);
 
   using SamlToken::GetAdvice;
   using SamlToken::GetAudience;
@@ -51,18 +59,28 @@ public:
   }
   const std::string &ToXml() const override { return m_xml; }
 
-  const TokenFacts &GetFacts() const noexcept { return m_facts; }
+  /// The subject's identifier exactly as written.
+  NameId GetNameId() const;
+
+  /// Which of the token's confirmations the verification chose, in document order.
+  std::size_t GetUsedConfirmation() const noexcept { return m_usedConfirmation; }
 
   /// @throws InvalidSignatureException unless `signature` verifies with one of the keys of `resolver`.
   static void ValidateSignature(const Tarvel::Xml::Security::Signature &signature,
                                 const Tarvel::Xml::Security::KeyInfoResolver &resolver);
 
 private:
+  void InitializeStrict(NodeFilterIterator &iterator, const Tarvel::Xml::Security::KeyInfoResolver &resolver,
+                        const VerifyOptions &options);
+  void InitializeSaml2(NodeFilterIterator &iterator, const Tarvel::Xml::Security::KeyInfoResolver &resolver,
+                       const VerifyOptions &options);
   void InitializeFromDom(const Tarvel::Xml::ElementNode *element,
-                         const Tarvel::Xml::Security::KeyInfoResolver &resolver, std::int64_t clockToleranceSec);
+                         const Tarvel::Xml::Security::KeyInfoResolver &resolver, const VerifyOptions &options);
 
   std::string m_xml;
   TokenFacts m_facts;
+  boost::optional<NameId> m_nameId; // empty in the profile STRICT, where the subject states it
+  std::size_t m_usedConfirmation = 0;
 };
 
 } // namespace SsoClient

@@ -29,18 +29,6 @@ bool ParseAttributeValue(NodeFilterIterator &iterator, std::string &value, Devia
   return RequireTextualContent(taken, value, sink);
 }
 
-/// An upper limit of the number of SAML attributes: it counts each element with at least one XML attribute. The caller
-/// reserves memory for all of them at once, because a sequence that grows step by step needs up to three times the
-/// memory.
-std::size_t CountPossibleAttributes(const ElementNode &statement) {
-  std::size_t count = 0;
-  for (const Tarvel::Xml::Node *child = statement.GetFirstChild(); child; child = child->GetNextSibling()) {
-    const ElementNode *const element = Tarvel::Xml::AsElement(child);
-    count += element && element->GetFirstAttribute() ? 1U : 0U;
-  }
-  return count;
-}
-
 } // namespace
 
 bool TryParseAdviceElement(NodeFilterIterator &iterator, boost::optional<AdviceType> &advice, DeviationSink &sink) {
@@ -106,6 +94,15 @@ void ParseAuthnContextElement(NodeFilterIterator &iterator, AuthnContextType &co
   RequireNoFurtherNode(child, "Unexpected elements after AuthnContextClassRef", sink);
 }
 
+std::size_t CountPossibleAttributes(const ElementNode &statement) {
+  std::size_t count = 0;
+  for (const Tarvel::Xml::Node *child = statement.GetFirstChild(); child; child = child->GetNextSibling()) {
+    const ElementNode *const element = Tarvel::Xml::AsElement(child);
+    count += element && element->GetFirstAttribute() ? 1U : 0U;
+  }
+  return count;
+}
+
 void ParseAttributeStatementElement(NodeFilterIterator &iterator, AttributeStatementType &statement,
                                     DeviationSink &sink) {
   const NodeFilterIterator taken = TakeListElement(iterator, "AttributeStatement", Namespaces::SAML, sink);
@@ -128,19 +125,26 @@ bool ParseAttributeElement(NodeFilterIterator &iterator, AttributeType &attribut
   if (!taken.node) {
     return false;
   }
-  const ElementNode &element = *IteratorToElement(taken);
-  RequireElementAttributesNames(element, {"Name"}, {"NameFormat", "FriendlyName"}, sink);
+  RequireElementAttributesNames(*IteratorToElement(taken), {"Name"}, {"NameFormat", "FriendlyName"}, sink);
+  ReadAttributeNames(*IteratorToElement(taken), attribute);
+  ReadAttributeValues(taken.GetChild(), attribute.values, ParseAttributeValue, sink);
+  return true;
+}
+
+void ReadAttributeNames(const ElementNode &element, AttributeType &attribute) {
   attribute.element = &element;
   attribute.Name = GetTextAttribute(element, "Name");
   attribute.NameFormat = GetTextAttribute(element, "NameFormat");
   attribute.FriendlyName = GetTextAttribute(element, "FriendlyName");
-  NodeFilterIterator child = taken.GetChild();
-  while (child.node) {
-    if (!ParseAttributeValue(child, attribute.values.emplace_back(), sink)) {
-      attribute.values.pop_back();
+}
+
+void ReadAttributeValues(NodeFilterIterator iterator, std::vector<std::string> &values, AttributeValueParser parseValue,
+                         DeviationSink &sink) {
+  while (iterator.node) {
+    if (!parseValue(iterator, values.emplace_back(), sink)) {
+      values.pop_back();
     }
   }
-  return true;
 }
 
 } // namespace SsoClient

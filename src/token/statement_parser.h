@@ -12,6 +12,10 @@
 
 #include <boost/optional.hpp>
 
+#include <cstddef>
+#include <string>
+#include <vector>
+
 namespace SsoClient {
 
 /// Reads a `saml:Advice`. Returns whether one was at the cursor. If not, the cursor and the record stay unchanged.
@@ -29,6 +33,11 @@ void ParseAuthnStatementElement(NodeFilterIterator &iterator, AuthnStatementType
 void ParseAuthnContextElement(NodeFilterIterator &iterator, AuthnContextType &context,
                               DeviationSink &sink = ThrowingSink());
 
+/// An upper limit of the number of SAML attributes in `statement`: it counts each element with at least one XML attribute.
+/// With it, memory is reserved for all of them at once, because a sequence that grows step by step needs up to three times
+/// the memory.
+std::size_t CountPossibleAttributes(const Tarvel::Xml::ElementNode &statement);
+
 /// Reads a `saml:AttributeStatement` and adds its attributes to those that `statement` has.
 void ParseAttributeStatementElement(NodeFilterIterator &iterator, AttributeStatementType &statement,
                                     DeviationSink &sink = ThrowingSink());
@@ -36,5 +45,15 @@ void ParseAttributeStatementElement(NodeFilterIterator &iterator, AttributeState
 /// Reads a `saml:Attribute`.
 bool ParseAttributeElement(NodeFilterIterator &iterator, AttributeType &attribute,
                            DeviationSink &sink = ThrowingSink());
+
+/// A function that reads a `saml:AttributeValue`. It returns whether `value` was set.
+using AttributeValueParser = bool (*)(NodeFilterIterator &iterator, std::string &value, DeviationSink &sink);
+
+/// Reads the names of `element`, a `saml:Attribute` whose XML attributes the caller has checked.
+void ReadAttributeNames(const Tarvel::Xml::ElementNode &element, AttributeType &attribute);
+
+/// Reads the values from the cursor on.
+void ReadAttributeValues(NodeFilterIterator iterator, std::vector<std::string> &values, AttributeValueParser parseValue,
+                         DeviationSink &sink);
 
 } // namespace SsoClient

@@ -2,9 +2,7 @@
 
 #include "token/subject_parser.h"
 
-#include "model/namespaces.h"
 #include "xml/expected_element.h"
-#include "xml/qualified_name.h"
 #include "xml/refuse.h"
 #include "xml/strict_checks.h"
 
@@ -25,7 +23,6 @@ using Tarvel::Ref;
 using Tarvel::Crypto::Certificate;
 using Tarvel::Xml::ElementNode;
 
-constexpr QNameView KEY_INFO_CONFIRMATION_DATA_TYPE(Namespaces::SAML, "KeyInfoConfirmationDataType");
 constexpr std::string_view METHOD_BEARER = "urn:oasis:names:tc:SAML:2.0:cm:bearer";
 constexpr std::string_view METHOD_HOLDER_OF_KEY = "urn:oasis:names:tc:SAML:2.0:cm:holder-of-key";
 
@@ -39,11 +36,12 @@ void ParseMethod(const ElementNode &element, SubjectConfirmationType &confirmati
   }
   const std::string_view method = attribute->GetValue();
   confirmation.writtenMethod = method;
-  confirmation.isMethodKnown = method == METHOD_BEARER || method == METHOD_HOLDER_OF_KEY;
-  if (confirmation.isMethodKnown) {
-    confirmation.Method = method == METHOD_BEARER ? SamlToken::BEARER : SamlToken::HOLDER_OF_KEY;
+  const boost::optional<SamlToken::ConfirmationType> type = FindConfirmationType(method);
+  confirmation.isMethodKnown = type.has_value();
+  if (type) {
+    confirmation.Method = *type;
   } else {
-    Refuse(sink, {element, "Method"}, METHODS, method, "Unknown subject confirmation method: '%1'", method);
+    RefuseMethod(&element, method, sink);
   }
 }
 
@@ -70,20 +68,6 @@ Ref<const Certificate> DecodeCertificate(const ElementNode &element, const std::
     refuse(error.what());
   }
   return {};
-}
-
-void ParseX509CertificateElement(NodeFilterIterator &iterator, Ref<const Certificate> &certificate,
-                                 DeviationSink &sink) {
-  const NodeFilterIterator taken = TakeElement(iterator, "X509Certificate", Namespaces::DS, sink);
-  if (!taken.node) {
-    return;
-  }
-  const ElementNode &element = *IteratorToElement(taken);
-  RequireNoAttributes(element, sink);
-  std::string base64;
-  if (RequireTextualContent(taken, base64, sink)) {
-    certificate = DecodeCertificate(element, base64, sink);
-  }
 }
 
 void ParseX509DataElement(NodeFilterIterator &iterator, Ref<const Certificate> &certificate, DeviationSink &sink) {
@@ -115,6 +99,17 @@ void ParseHolderOfKeyData(const NodeFilterIterator &data, Ref<const Certificate>
 }
 
 } // namespace
+
+void RefuseMethod(const ElementNode *confirmation, std::string_view method, DeviationSink &sink) {
+  Refuse(sink, {confirmation, "Method"}, METHODS, method, "Unknown subject confirmation method: '%1'", method);
+}
+
+boost::optional<SamlToken::ConfirmationType> FindConfirmationType(std::string_view method) {
+  if (method == METHOD_BEARER) {
+    return SamlToken::BEARER;
+  }
+  return method == METHOD_HOLDER_OF_KEY ? boost::make_optional(SamlToken::HOLDER_OF_KEY) : boost::none;
+}
 
 void ParseNameIDType(NodeFilterIterator &iterator, NameIDType &nameId, DeviationSink &sink) {
   const ElementNode &element = *IteratorToElement(iterator);
@@ -186,6 +181,20 @@ void ParseSubjectConfirmationDataElement(NodeFilterIterator &iterator, SamlToken
     RequireElementAttributesNames(element, {"NotOnOrAfter"}, {}, sink);
     RequireEmptyElement(taken, sink);
     GetDateAttribute(element, "NotOnOrAfter", data.NotOnOrAfter, sink);
+  }
+}
+
+void ParseX509CertificateElement(NodeFilterIterator &iterator, Ref<const Certificate> &certificate,
+                                 DeviationSink &sink) {
+  const NodeFilterIterator taken = TakeElement(iterator, "X509Certificate", Namespaces::DS, sink);
+  if (!taken.node) {
+    return;
+  }
+  const ElementNode &element = *IteratorToElement(taken);
+  RequireNoAttributes(element, sink);
+  std::string base64;
+  if (RequireTextualContent(taken, base64, sink)) {
+    certificate = DecodeCertificate(element, base64, sink);
   }
 }
 

@@ -3,7 +3,6 @@
 #include "token/token_checks.h"
 
 #include "xml/date_time_text.h"
-#include "xml/refuse.h"
 
 #include <algorithm>
 #include <string_view>
@@ -29,17 +28,18 @@ std::string ToleranceText(std::int64_t clockToleranceSec) {
   return ", with a tolerance of " + std::to_string(clockToleranceSec) + " s";
 }
 
-void CheckStart(const ConditionsType &conditions, const DateTime &now, std::int64_t clockToleranceSec,
-                DeviationSink &sink) {
+} // namespace
+
+void CheckStart(const TimeLimit &start, const DateTime &now, std::int64_t clockToleranceSec, DeviationSink &sink) {
   // Compares differences of dates. It does not shift dates, because a shifted date cannot leave the years 1 to 9999.
   const std::int64_t tolerance = Tarvel::System::SecondsToMicroseconds(clockToleranceSec);
-  const std::int64_t missed = conditions.NotBefore.MicrosecondsSince(now);
+  const std::int64_t missed = start.date.MicrosecondsSince(now);
   if (missed > tolerance) {
     ReportDeviation(sink, [&] {
-      const std::string text = DateTimeFormatter(conditions.NotBefore);
-      return Deviation{"Token start date is in the future: " + text,
-                       conditions.element,
-                       "NotBefore",
+      const std::string text = DateTimeFormatter(start.date);
+      return Deviation{start.message + text,
+                       start.place.element,
+                       std::string(start.place.attribute),
                        "at or before " + DateTimeFormatter(now) + ToleranceText(clockToleranceSec),
                        text,
                        ToSeconds(Excess(missed, tolerance) - 1) + 1};
@@ -47,24 +47,21 @@ void CheckStart(const ConditionsType &conditions, const DateTime &now, std::int6
   }
 }
 
-void CheckEnd(const ConditionsType &conditions, const DateTime &now, std::int64_t clockToleranceSec,
-              DeviationSink &sink) {
+void CheckEnd(const TimeLimit &end, const DateTime &now, std::int64_t clockToleranceSec, DeviationSink &sink) {
   const std::int64_t tolerance = Tarvel::System::SecondsToMicroseconds(clockToleranceSec);
-  const std::int64_t missed = now.MicrosecondsSince(conditions.NotOnOrAfter);
+  const std::int64_t missed = now.MicrosecondsSince(end.date);
   if (missed >= tolerance) {
     ReportDeviation(sink, [&] {
-      const std::string text = DateTimeFormatter(conditions.NotOnOrAfter);
-      return Deviation{"The token has expired at: " + text,
-                       conditions.element,
-                       "NotOnOrAfter",
+      const std::string text = DateTimeFormatter(end.date);
+      return Deviation{end.message + text,
+                       end.place.element,
+                       std::string(end.place.attribute),
                        "after " + DateTimeFormatter(now) + ToleranceText(clockToleranceSec),
                        text,
                        ToSeconds(Excess(missed, tolerance)) + 1};
     });
   }
 }
-
-} // namespace
 
 void CheckTokenProperties(const SamlAssertionType &assertion, std::int64_t clockToleranceSec) {
   DeviationSink &sink = ThrowingSink();
@@ -88,14 +85,19 @@ void CheckId(const SamlAssertionType &assertion, DeviationSink &sink) {
 }
 
 DateTime CheckValidity(const ConditionsType &conditions, std::int64_t clockToleranceSec, DeviationSink &sink) {
+  return CheckValidity(conditions, {conditions.element, "NotBefore"}, clockToleranceSec, sink);
+}
+
+DateTime CheckValidity(const ConditionsType &conditions, const Place &start, std::int64_t clockToleranceSec,
+                       DeviationSink &sink) {
   if (!(conditions.NotBefore < conditions.NotOnOrAfter)) {
-    Refuse(sink, {conditions.element, "NotBefore"}, "before " + DateTimeFormatter(conditions.NotOnOrAfter),
-           DateTimeFormatter(conditions.NotBefore),
+    Refuse(sink, start, "before " + DateTimeFormatter(conditions.NotOnOrAfter), DateTimeFormatter(conditions.NotBefore),
            "Unsatisfiable token validity conditions: NotBefore must be less than NotOnOrAfter.");
   }
   const DateTime now = Tarvel::System::GetUtcDateTime();
-  CheckStart(conditions, now, clockToleranceSec, sink);
-  CheckEnd(conditions, now, clockToleranceSec, sink);
+  CheckStart({conditions.NotBefore, start, "Token start date is in the future: "}, now, clockToleranceSec, sink);
+  CheckEnd({conditions.NotOnOrAfter, {conditions.element, "NotOnOrAfter"}, "The token has expired at: "}, now,
+           clockToleranceSec, sink);
   return now;
 }
 
@@ -115,15 +117,23 @@ void CheckDelegation(const SamlAssertionType &assertion, DeviationSink &sink) {
       restriction && !restriction->delegates.empty() ? &restriction->delegates.back().NameID : nullptr;
   const std::string_view lastName = last ? std::string_view(last->value) : std::string_view();
   if (confirmation.NameID && !restriction) {
-    Refuse(sink, confirmation.NameID->element, "no delegate id", confirmation.NameID->value,
-           "Token SubjectConfirmation contains delegate id, but no delegation restriction is present");
+    RefuseUnexpectedDelegate(*confirmation.NameID, sink);
   } else if (!confirmation.NameID && restriction) {
     Refuse(sink, confirmation.element, lastName, std::string(),
            "Token has delegation restriction, but no delegate id is present in the SubjectConfirmation");
   } else if (confirmation.NameID && (!last || *confirmation.NameID != *last)) {
-    Refuse(sink, confirmation.NameID->element, lastName, confirmation.NameID->value,
-           "The SubjectConfirmation delegate id does not match the id of the last delegate");
+    RefuseOtherDelegate(*confirmation.NameID, lastName, sink);
   }
+}
+
+void RefuseUnexpectedDelegate(const NameIDType &delegate, DeviationSink &sink) {
+  Refuse(sink, delegate.element, "no delegate id", delegate.value,
+         "Token SubjectConfirmation contains delegate id, but no delegation restriction is present");
+}
+
+void RefuseOtherDelegate(const NameIDType &delegate, std::string_view lastDelegate, DeviationSink &sink) {
+  Refuse(sink, delegate.element, lastDelegate, delegate.value,
+         "The SubjectConfirmation delegate id does not match the id of the last delegate");
 }
 
 void CheckAudience(const std::set<std::string> &audience, const VerifyOptions &options, const ElementNode *conditions,

@@ -9,6 +9,7 @@
 
 #include "token/assertion_model.h"
 #include "xml/deviation_sink.h"
+#include "xml/refuse.h"
 
 #include <ssoclient/saml_token.h>
 #include <ssoclient/verify_options.h>
@@ -18,6 +19,7 @@
 #include <cstdint>
 #include <set>
 #include <string>
+#include <string_view>
 
 namespace SsoClient {
 
@@ -32,8 +34,30 @@ void CheckId(const SamlAssertionType &assertion, DeviationSink &sink);
 /// Returns this machine's time, with which the validity was compared.
 Tarvel::System::DateTime CheckValidity(const ConditionsType &conditions, std::int64_t clockToleranceSec,
                                        DeviationSink &sink);
+/// The same for conditions whose `NotBefore` is written at the place `start`.
+Tarvel::System::DateTime CheckValidity(const ConditionsType &conditions, const Place &start,
+                                       std::int64_t clockToleranceSec, DeviationSink &sink);
 void CheckSubjectValidity(const SamlAssertionType &assertion, DeviationSink &sink);
 void CheckDelegation(const SamlAssertionType &assertion, DeviationSink &sink);
+
+/// Refuses the delegate of a confirmation: there is no delegation restriction, or its last delegate is another one.
+void RefuseUnexpectedDelegate(const NameIDType &delegate, DeviationSink &sink);
+void RefuseOtherDelegate(const NameIDType &delegate, std::string_view lastDelegate, DeviationSink &sink);
+
+/// A date at which something begins or ends.
+struct TimeLimit {
+  const Tarvel::System::DateTime &date;
+  Place place;         ///< where it is written
+  const char *message; ///< the text of the refusal, up to the date
+};
+
+/// Checks that `start` is not after `now` by more than the tolerance.
+void CheckStart(const TimeLimit &start, const Tarvel::System::DateTime &now, std::int64_t clockToleranceSec,
+                DeviationSink &sink);
+
+/// Checks that `now` is before `end`, with the tolerance.
+void CheckEnd(const TimeLimit &end, const Tarvel::System::DateTime &now, std::int64_t clockToleranceSec,
+              DeviationSink &sink);
 
 /// Checks that `options` accept one of the token's audiences. `audience` is empty if the token is not restricted.
 /// @param conditions the place that is reported; may be null

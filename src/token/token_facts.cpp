@@ -17,7 +17,6 @@ constexpr std::string_view GROUP_IDENTITY = SSOCLIENT_EXTENSION_AUTHORITY "/sche
 constexpr std::string_view IS_SOLUTION = SSOCLIENT_SOLUTION_AUTHORITY "/schemas/attr-names/2011/07/isSolution";
 constexpr std::string_view GIVEN_NAME = "http://schemas.xmlsoap.org/ws/2005/05/identity/claims/givenname";
 constexpr std::string_view SUR_NAME = "http://schemas.xmlsoap.org/ws/2005/05/identity/claims/surname";
-constexpr std::string_view FORMAT_UPN = "http://schemas.xmlsoap.org/claims/UPN";
 
 /// Whether there is text before and after `separator`, a position in `text` or npos.
 bool HasBothSides(const std::string &text, std::size_t separator) {
@@ -30,20 +29,30 @@ bool Allows(const boost::optional<Restriction> &restriction) {
   return restriction && restriction->Count && *restriction->Count != 0;
 }
 
-void TakeGroups(AttributeType &attribute, TokenFacts &facts, DeviationSink &sink) {
+/// In the profile SAML2, a group may be a name without a domain.
+bool ParseGroup(std::string &&value, TokenProfile profile, PrincipalId &group, const Tarvel::Xml::ElementNode *place,
+                DeviationSink &sink) {
+  if (profile == TokenProfile::SAML2 && !value.empty() && value.find('\\') == std::string::npos) {
+    group.name = std::move(value);
+    return true;
+  }
+  return ParseGroupIdentity(std::move(value), group, place, sink);
+}
+
+void TakeGroups(AttributeType &attribute, TokenProfile profile, TokenFacts &facts, DeviationSink &sink) {
   if (facts.groups.empty()) { // reserving for each attribute would copy all groups each time
     facts.groups.reserve(attribute.values.size());
   }
   for (std::string &value : attribute.values) {
-    if (!ParseGroupIdentity(std::move(value), facts.groups.emplace_back(), attribute.element, sink)) {
+    if (!ParseGroup(std::move(value), profile, facts.groups.emplace_back(), attribute.element, sink)) {
       facts.groups.pop_back();
     }
   }
 }
 
-void PopulateTokenAttribute(AttributeType &attribute, TokenFacts &facts, DeviationSink &sink) {
+void PopulateTokenAttribute(AttributeType &attribute, TokenProfile profile, TokenFacts &facts, DeviationSink &sink) {
   if (SamlAttributeIsGroupIdentity(attribute)) {
-    TakeGroups(attribute, facts, sink);
+    TakeGroups(attribute, profile, facts, sink);
   } else if (SamlAttributeIsSolution(attribute)) {
     ParseIsSolutionAttribute(attribute, facts.solution, sink);
   } else if (SamlAttributeIsGivenName(attribute)) {
@@ -71,13 +80,13 @@ void TakeSubject(SamlAssertionType &assertion, TokenFacts &facts, DeviationSink 
   facts.confirmationCertificate = std::move(assertion.Subject.SubjectConfirmation.SubjectConfirmationData.certificate);
 }
 
-void TakeAttributes(SamlAssertionType &assertion, TokenFacts &facts, DeviationSink &sink) {
+void TakeAttributes(SamlAssertionType &assertion, TokenFacts &facts, DeviationSink &sink, TokenProfile profile) {
   if (assertion.Advice) {
     facts.advice = std::move(assertion.Advice->advice);
   }
   if (assertion.AttributeStatement) {
     for (AttributeType &attribute : assertion.AttributeStatement->attributes) {
-      PopulateTokenAttribute(attribute, facts, sink);
+      PopulateTokenAttribute(attribute, profile, facts, sink);
     }
   }
 }
@@ -85,8 +94,7 @@ void TakeAttributes(SamlAssertionType &assertion, TokenFacts &facts, DeviationSi
 void TakeConditions(ConditionsType &conditions, TokenFacts &facts, DeviationSink &sink) {
   facts.startDate = conditions.NotBefore;
   facts.endDate = conditions.NotOnOrAfter;
-  facts.renewable = Allows(conditions.RenewRestriction);
-  facts.delegable = Allows(conditions.ProxyRestriction);
+  TakePermissions(conditions, facts);
   if (conditions.DelegationRestriction) {
     for (const DelegateType &delegate : conditions.DelegationRestriction->delegates) {
       Delegate parsed;
@@ -98,6 +106,11 @@ void TakeConditions(ConditionsType &conditions, TokenFacts &facts, DeviationSink
   if (conditions.AudienceRestriction) {
     facts.audience = std::move(conditions.AudienceRestriction->audiences);
   }
+}
+
+void TakePermissions(const ConditionsType &conditions, TokenFacts &facts) {
+  facts.renewable = Allows(conditions.RenewRestriction);
+  facts.delegable = Allows(conditions.ProxyRestriction);
 }
 
 bool SamlAttributeIsGroupIdentity(const AttributeType &attribute) {
@@ -148,13 +161,20 @@ bool ParseSamlNameId(const NameIDType &nameId, PrincipalId &principal, Deviation
            nameId.Format);
     return false;
   }
-  const std::size_t atSign = nameId.value.rfind('@');
-  if (!HasBothSides(nameId.value, atSign)) {
+  if (!SplitUserPrincipalName(nameId.value, principal)) {
     Refuse(sink, nameId.element, "name@domain", nameId.value,
            "Failed to parse the UPN NameID: `%1'; name or domain part is missing.", nameId.value);
     return false;
   }
-  principal = {nameId.value.substr(0, atSign), nameId.value.substr(atSign + 1)};
+  return true;
+}
+
+bool SplitUserPrincipalName(const std::string &text, PrincipalId &principal) {
+  const std::size_t atSign = text.rfind('@');
+  if (!HasBothSides(text, atSign)) {
+    return false;
+  }
+  principal = {text.substr(0, atSign), text.substr(atSign + 1)};
   return true;
 }
 

@@ -11,6 +11,7 @@
 #include <ssoclient/delegate.h>
 #include <ssoclient/principal_id.h>
 #include <ssoclient/saml_token.h>
+#include <ssoclient/verify_options.h>
 #include <tarvel/core/ref.h>
 #include <tarvel/crypto/certificate.h>
 #include <tarvel/system/date_time.h>
@@ -18,10 +19,14 @@
 
 #include <set>
 #include <string>
+#include <string_view>
 #include <utility>
 #include <vector>
 
 namespace SsoClient {
+
+/// The `Format` of a user principal name, `name@domain`.
+constexpr std::string_view FORMAT_UPN = "http://schemas.xmlsoap.org/claims/UPN";
 
 /// The content of an assertion, verified or not.
 struct TokenFacts {
@@ -48,8 +53,12 @@ TokenFacts TakeTokenFacts(SamlAssertionType &&assertion);
 /// The steps of `TakeTokenFacts`, in their order. What cannot be read is reported to `sink`, and left out if the sink
 /// does not throw. They move values out of their first argument.
 void TakeSubject(SamlAssertionType &assertion, TokenFacts &facts, DeviationSink &sink);
-void TakeAttributes(SamlAssertionType &assertion, TokenFacts &facts, DeviationSink &sink);
+void TakeAttributes(SamlAssertionType &assertion, TokenFacts &facts, DeviationSink &sink,
+                    TokenProfile profile = TokenProfile::STRICT);
 void TakeConditions(ConditionsType &conditions, TokenFacts &facts, DeviationSink &sink);
+
+/// The part of `TakeConditions` that both profiles have: whether the token may be renewed, and whether it may be delegated.
+void TakePermissions(const ConditionsType &conditions, TokenFacts &facts);
 
 /// The four kinds of attributes that are read; others are ignored. Each function checks the `Name` of `attribute`.
 bool SamlAttributeIsGroupIdentity(const AttributeType &attribute);
@@ -64,6 +73,9 @@ PrincipalId ParseGroupIdentity(std::string value);
 /// The principal in the form `name@domain`. The last at-sign is the separator.
 /// @throws ParseException when the format is not that of a user principal name, or when name or domain is missing.
 PrincipalId ParseSamlNameId(const NameIDType &nameId);
+
+/// Splits `text` at its last at-sign. Returns whether there is text on both sides; otherwise `principal` is not changed.
+bool SplitUserPrincipalName(const std::string &text, PrincipalId &principal);
 
 /// Whether the attribute's only value is "true", in any letter case.
 /// @throws ParseException when it has no value or several.

@@ -3,10 +3,12 @@
 #include <ssoclient/token_verifier.h>
 
 #include "token/saml_token_impl.h"
-#include "token/token_checks.h"
 #include "token/token_explainer.h"
 
+#include <tarvel/core/exception.h>
 #include <tarvel/xml/security/key_info_resolver.h>
+
+#include <string>
 
 namespace SsoClient {
 
@@ -15,22 +17,27 @@ namespace {
 using Tarvel::Xml::ElementNode;
 using Tarvel::Xml::Security::KeyInfoResolver;
 
-/// Makes the token of `source`, a text or an element.
-template <typename Source>
-std::shared_ptr<const SamlToken> MakeToken(const Source &source, const KeyInfoResolver &resolver,
-                                           const VerifyOptions &options) {
-  auto token = std::make_shared<const SamlTokenImpl>(source, resolver, options.clockToleranceSec);
-  const TokenFacts &facts = token->GetFacts();
-  CheckAudience(facts.audience, options, nullptr, ThrowingSink());
-  CheckRequiredConfirmation(facts.confirmationMethod, options, nullptr, ThrowingSink());
-  return token;
+/// Refuses an option that the strict form cannot fulfil: a check that cannot be made must not be left out silently.
+void RequireSaml2(bool isSet, const char *option) {
+  if (isSet) {
+    throw Tarvel::InvalidArgumentException(std::string("VerifyOptions::") + option + " needs the profile SAML2");
+  }
+}
+
+const VerifyOptions &Consistent(const VerifyOptions &options) {
+  if (options.profile != TokenProfile::SAML2) {
+    RequireSaml2(!options.acceptedRecipients.empty(), "acceptedRecipients");
+    RequireSaml2(options.expectedInResponseTo.has_value(), "expectedInResponseTo");
+    RequireSaml2(options.senderAddress.has_value(), "senderAddress");
+  }
+  return options;
 }
 
 } // namespace
 
 struct TokenVerifier::State {
   State(const Tarvel::Crypto::CertificateList &trusted, const VerifyOptions &verifyOptions)
-      : resolver(Tarvel::Xml::Security::CreateTrustSetKeyResolver(trusted)), options(verifyOptions) {}
+      : resolver(Tarvel::Xml::Security::CreateTrustSetKeyResolver(trusted)), options(Consistent(verifyOptions)) {}
 
   const Tarvel::Ref<KeyInfoResolver> resolver;
   const VerifyOptions options;
@@ -40,11 +47,11 @@ TokenVerifier::TokenVerifier(const Tarvel::Crypto::CertificateList &trustedCerti
     : m_state(std::make_shared<const State>(trustedCertificates, options)) {}
 
 std::shared_ptr<const SamlToken> TokenVerifier::Verify(const std::string &xml) const {
-  return MakeToken(xml, *m_state->resolver, m_state->options);
+  return std::make_shared<const SamlTokenImpl>(xml, *m_state->resolver, m_state->options);
 }
 
 std::shared_ptr<const SamlToken> TokenVerifier::Verify(const ElementNode &element) const {
-  return MakeToken(element, *m_state->resolver, m_state->options);
+  return std::make_shared<const SamlTokenImpl>(element, *m_state->resolver, m_state->options);
 }
 
 TokenReport TokenVerifier::Explain(const std::string &xml) const {

@@ -51,12 +51,14 @@ bool Contains(const Names &names, const Name &name) {
   return std::find(names.begin(), names.end(), name) != names.end();
 }
 
-void ReadDate(const ElementNode &element, std::string_view name, std::string_view text, Tarvel::System::DateTime &date,
+bool ReadDate(const ElementNode &element, std::string_view name, std::string_view text, Tarvel::System::DateTime &date,
               DeviationSink &sink) {
-  if (!Tarvel::System::DateTime::TryParse(text, date)) {
-    Refuse(sink, {element, name}, "a date of the form xsd:dateTime", text, "%1/@%2 is not a date", element.GetName(),
-           name);
+  if (Tarvel::System::DateTime::TryParse(text, date)) {
+    return true;
   }
+  Refuse(sink, {element, name}, "a date of the form xsd:dateTime", text, "%1/@%2 is not a date", element.GetName(),
+         name);
+  return false;
 }
 
 bool HasAttributeWritten(const ElementNode &element, std::string_view name) {
@@ -132,7 +134,8 @@ void RequireElementAttributesNames(const ElementNode &element, std::initializer_
 }
 
 void RequireElementAttributesQNames(const ElementNode &element, std::initializer_list<QNameView> required,
-                                    std::initializer_list<QNameView> optional, DeviationSink &sink) {
+                                    std::initializer_list<QNameView> optional, DeviationSink &sink,
+                                    bool (*isIgnored)(const QNameView &name)) {
   const AttributesOfNames<QNameView> allowed{required, optional};
   for (const Attribute *attribute = element.GetFirstAttribute(); attribute; attribute = attribute->GetNext()) {
     const std::string_view written = attribute->GetName();
@@ -140,7 +143,7 @@ void RequireElementAttributesQNames(const ElementNode &element, std::initializer
       continue;
     }
     const std::optional<QNameView> name = ResolveQName(element, written, written, std::string_view(), sink);
-    if (name && !Contains(required, *name) && !Contains(optional, *name)) {
+    if (name && !Contains(required, *name) && !Contains(optional, *name) && !(isIgnored && isIgnored(*name))) {
       Refuse(sink, {element, written}, allowed, attribute->GetValue(), "Unexpected attribute '%1' on element '%2'",
              *name, element.GetName());
     }
@@ -174,11 +177,10 @@ void GetDateAttribute(const ElementNode &element, std::string_view name, Tarvel:
   ReadDate(element, name, GetTextAttribute(element, name), date, ThrowingSink());
 }
 
-void GetDateAttribute(const ElementNode &element, std::string_view name, Tarvel::System::DateTime &date,
+bool GetDateAttribute(const ElementNode &element, std::string_view name, Tarvel::System::DateTime &date,
                       DeviationSink &sink) {
-  if (const Attribute *const attribute = element.FindAttribute(std::string_view(), name)) {
-    ReadDate(element, name, attribute->GetValue(), date, sink);
-  }
+  const Attribute *const attribute = element.FindAttribute(std::string_view(), name);
+  return attribute && ReadDate(element, name, attribute->GetValue(), date, sink);
 }
 
 void GetBoolAttribute(const ElementNode &element, std::string_view name, bool &flag, DeviationSink &sink) {

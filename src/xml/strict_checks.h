@@ -53,9 +53,11 @@ void RequireElementAttributesNames(const Tarvel::Xml::ElementNode &element,
                                    std::initializer_list<std::string_view> optional,
                                    DeviationSink &sink = ThrowingSink());
 
-/// The same, but attributes are compared by qualified name.
+/// The same, but attributes are compared by qualified name, and others are not refused if `isIgnored` returns true for
+/// their names.
 void RequireElementAttributesQNames(const Tarvel::Xml::ElementNode &element, std::initializer_list<QNameView> required,
-                                    std::initializer_list<QNameView> optional, DeviationSink &sink = ThrowingSink());
+                                    std::initializer_list<QNameView> optional, DeviationSink &sink = ThrowingSink(),
+                                    bool (*isIgnored)(const QNameView &name) = nullptr);
 
 /// The element at the cursor must contain one text and nothing else. Two texts with a comment between them are refused, so
 /// that a comment cannot cut off a part of a value. White space at either end is the exception: if a comment separates
@@ -68,8 +70,9 @@ std::string_view GetTextAttribute(const Tarvel::Xml::ElementNode &element, std::
 /// Reads an attribute in the form xsd:dateTime. An attribute that is missing is refused like an empty one.
 void GetDateAttribute(const Tarvel::Xml::ElementNode &element, std::string_view name, Tarvel::System::DateTime &date);
 
-/// The same, but an attribute that is missing is not refused: `RequireElementAttributesNames` has reported it.
-void GetDateAttribute(const Tarvel::Xml::ElementNode &element, std::string_view name, Tarvel::System::DateTime &date,
+/// The same, but an attribute that is missing is not refused: `RequireElementAttributesNames` has reported it. Returns
+/// whether `date` was set.
+bool GetDateAttribute(const Tarvel::Xml::ElementNode &element, std::string_view name, Tarvel::System::DateTime &date,
                       DeviationSink &sink);
 
 /// Reads an attribute that is "1", "true", "0" or "false", in any letter case.

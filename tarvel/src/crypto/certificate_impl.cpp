@@ -109,8 +109,7 @@ KeyKind FindKeyKind(EVP_PKEY *key) {
   return EVP_PKEY_is_a(key, "EC") ? FindCurve(key) : KeyKind::OTHER;
 }
 
-// With the exponent 1, anyone can sign; for an even exponent, there is no private key (RFC 8017, section 3.1).
-bool IsExponentSound(EVP_PKEY *key) {
+bool HasSoundExponent(EVP_PKEY *key) {
   const OpenSslErrorScope errors;
   BIGNUM *read = nullptr;
   const int isRead = EVP_PKEY_get_bn_param(key, OSSL_PKEY_PARAM_RSA_E, &read);
@@ -118,7 +117,7 @@ bool IsExponentSound(EVP_PKEY *key) {
   if (isRead != 1) {
     errors.Throw("The RSA key's exponent cannot be read");
   }
-  return BN_is_odd(exponent.get()) && !BN_is_one(exponent.get()) && !BN_is_negative(exponent.get());
+  return IsExponentSound(exponent.get());
 }
 
 std::string CopyBioText(BIO *bio) {
@@ -164,7 +163,7 @@ CertificateImpl::CertificateImpl(const std::uint8_t *data, std::size_t length)
     errors.RequireMemory();
   }
   m_keyBits = m_nativeKey ? static_cast<unsigned>(EVP_PKEY_get_bits(m_nativeKey)) : 0;
-  m_hasAcceptableExponent = m_keyKind != KeyKind::RSA || IsExponentSound(m_nativeKey);
+  m_hasAcceptableExponent = m_keyKind != KeyKind::RSA || HasSoundExponent(m_nativeKey);
 }
 
 std::string CertificateImpl::GetSubject() const {
@@ -199,6 +198,10 @@ std::string CertificateImpl::ToPem() const {
     errors.Throw("Certificate cannot be written as PEM");
   }
   return CopyBioText(bio.get());
+}
+
+bool IsExponentSound(const BIGNUM *exponent) noexcept {
+  return BN_is_odd(exponent) && !BN_is_one(exponent) && !BN_is_negative(exponent);
 }
 
 const CertificateImpl &AsImpl(const Certificate &certificate) {

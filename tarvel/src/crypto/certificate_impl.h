@@ -49,6 +49,10 @@ private:
   mutable KeyContexts m_verifyContexts;
 };
 
+/// Whether an RSA key with this public exponent can be used: with the exponent 1, anyone can sign; for an even exponent,
+/// there is no private key (RFC 8017, section 3.1).
+bool IsExponentSound(const BIGNUM *exponent) noexcept;
+
 /// Downcasts `certificate`.
 /// @throws TypeMismatchException when it is an instance of another class.
 const CertificateImpl &AsImpl(const Certificate &certificate);

@@ -146,6 +146,10 @@ bool HasAcceptableExponent(const Certificate &certificate) {
 std::string RefuseKey(const Certificate &certificate) {
   unsigned bits = 0;
   const KeyKind kind = GetKeyKind(certificate, bits);
+  return RefuseKey(kind, bits, HasAcceptableExponent(certificate));
+}
+
+std::string RefuseKey(KeyKind kind, unsigned bits, bool hasAcceptableExponent) {
   if (kind == KeyKind::OTHER) {
     return "the key is neither RSA nor on the curves P-256, P-384 and P-521";
   }
@@ -153,7 +157,7 @@ std::string RefuseKey(const Certificate &certificate) {
     return "the RSA key has only " + std::to_string(bits) + " bits; " + std::to_string(MIN_RSA_BITS) +
            " are the minimum";
   }
-  return HasAcceptableExponent(certificate) ? "" : "the RSA key's public exponent is even or 1";
+  return hasAcceptableExponent || kind != KeyKind::RSA ? "" : "the RSA key's public exponent is even or 1";
 }
 
 bool VerifyDigest(const Certificate &certificate, SignatureScheme scheme, DigestAlgorithm algorithm,

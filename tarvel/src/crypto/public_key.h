@@ -34,6 +34,9 @@ bool HasAcceptableExponent(const Certificate &certificate);
 /// accepted key is RSA with at least `MIN_RSA_BITS` and an acceptable exponent, or EC on P-256, P-384 or P-521.
 std::string RefuseKey(const Certificate &certificate);
 
+/// The same for a key of this kind and size. The exponent only matters for RSA.
+std::string RefuseKey(KeyKind kind, unsigned bits, bool hasAcceptableExponent);
+
 /// Whether `signature` is the signature by the certificate's key over a message with that digest. An ECDSA value is r
 /// and s one after the other, as in XML Signature (RFC 4050, section 3.3). RSA-PSS uses MGF1 with the same digest, and
 /// a salt as long as the digest. False for malformed values, and when the key does not match the scheme. Safe on any

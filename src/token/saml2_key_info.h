@@ -1,0 +1,23 @@
+// SPDX-License-Identifier: Apache-2.0
+/// @file
+/// `ParseKeyInfo`, which reads the key of a holder-of-key confirmation.
+
+#pragma once
+
+#include "xml/deviation_sink.h"
+#include "xml/node_filter_iterator.h"
+
+#include <ssoclient/token_details.h>
+
+namespace SsoClient {
+
+/// Reads the `ds:KeyInfo` at the cursor. The key is that of its first certificate or that of its first key value
+/// (`RSAKeyValue`, or `ECKeyValue` with a named curve). If both are there, they must be the same. Everything else in a
+/// `ds:KeyInfo` is ignored.
+///
+/// If there is no key, or a key value of a kind or size with which no signature is accepted, `details.publicKey` stays
+/// empty. The key of a certificate may have any kind and size, as in the profile STRICT.
+void ParseKeyInfo(const NodeFilterIterator &iterator, ConfirmationDetails &details,
+                  DeviationSink &sink = ThrowingSink());
+
+} // namespace SsoClient

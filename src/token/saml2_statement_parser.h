@@ -1,0 +1,22 @@
+// SPDX-License-Identifier: Apache-2.0
+/// @file
+/// Readers of the profile SAML2 for advice and statements.
+
+#pragma once
+
+#include "token/saml2_model.h"
+#include "xml/deviation_sink.h"
+#include "xml/node_filter_iterator.h"
+
+namespace SsoClient {
+
+/// Reads a `saml:Advice`, if one is at the cursor: each `RSAAdvice` in it. Other elements are ignored, because an advice may
+/// be ignored (SAML 2.0 core, section 2.6.1).
+void TryParseSaml2AdviceElement(NodeFilterIterator &iterator, boost::optional<AdviceType> &advice,
+                                DeviationSink &sink = ThrowingSink());
+
+/// Reads the statements from the cursor on: authentication and attributes, in any order and number.
+void ParseSaml2Statements(NodeFilterIterator &iterator, Saml2Assertion &assertion,
+                          DeviationSink &sink = ThrowingSink());
+
+} // namespace SsoClient
