@@ -84,6 +84,38 @@ TEST(CreateGssNegotiationContext, SignsRequestsWithTheHolderOfKeyIdentity) {
   EXPECT_NE(server.GetRequests().at(1).find("ds:SignatureValue"), std::string::npos);
 }
 
+TEST(CreateGssNegotiationContext, SpeaksTheDialectInEveryLeg) {
+  const std::string last = Testing::ResponseElement("<wst:TokenType>urn:type</wst:TokenType>" +
+                                                        Testing::Requested(Testing::ReadDataFile("tokens/bearer.xml")),
+                                                    " Context='ctx'");
+  const Testing::PostingServer server({Testing::IntermediateLeg("ctx", "AQID"), Testing::Envelope(last)});
+  ServiceOptions options;
+  options.dialect.declaresCharset = true;
+  options.dialect.addressing = true;
+  options.dialect.appliesTo = std::string("urn:service");
+  options.dialect.tokenType = "urn:type";
+  options.dialect.acceptsAnyResponse = true;
+  const auto context = CreateGssNegotiationContext(ConfigFor(server.GetUrl()), Spec(), options);
+  EXPECT_EQ(context->NegotiateToken({7}).token, nullptr);
+  EXPECT_NE(context->NegotiateToken({8}).token, nullptr);
+  const std::vector<std::string> requests = server.GetRequests();
+  ASSERT_EQ(requests.size(), 2u);
+  for (const std::string &request : requests) {
+    EXPECT_NE(request.find("\r\nContent-Type: text/xml; charset=utf-8\r\n"), std::string::npos) << request;
+    EXPECT_NE(request.find(">" + server.GetUrl() + "</wsa:To>"), std::string::npos) << request;
+  }
+  EXPECT_NE(requests[0].find("<wsp:AppliesTo "), std::string::npos);
+  EXPECT_NE(requests[1].find("/RSTR/Issue</wsa:Action>"), std::string::npos);
+}
+
+TEST(CreateGssNegotiationContext, RefusesADialectThatContradictsItself) {
+  ServiceOptions options;
+  options.dialect.appliesTo = std::string("service");
+  EXPECT_THROWS_MESSAGE(CreateGssNegotiationContext(ConfigFor("http://localhost/"), Spec(), options),
+                        Tarvel::InvalidArgumentException,
+                        "Invalid argument : ServiceDialect::appliesTo is not an absolute URI: \"service\"");
+}
+
 TEST(CreateGssNegotiationContext, RefusesAConfigurationWithoutTrustedCertificates) {
   SecurityTokenServiceConfig config = ConfigFor("http://localhost/");
   config.signingCertificates.clear();

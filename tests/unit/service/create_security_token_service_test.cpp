@@ -87,6 +87,55 @@ TEST(CreateSecurityTokenService, PassesTheSslParameterToTheHandshake) {
           shown->GetSha256Thumbprint() + " instead of " + config.sslParameter);
 }
 
+TEST(CreateSecurityTokenService, SpeaksTheDialectInRequestsAndResponses) {
+  const std::string fault = "<soapenv:Fault xmlns:x='urn:faults'><faultcode>x:Denied</faultcode></soapenv:Fault>";
+  const std::string outside = Testing::RenewResponse(Testing::ReadDataFile("tokens/bearer.xml"));
+  const PostingServer server({outside, Testing::Envelope(fault)});
+  ServiceOptions options;
+  options.dialect.declaresCharset = true;
+  options.dialect.addressing = true;
+  options.dialect.appliesTo = std::string("urn:service");
+  options.dialect.credentialFaults = {{"urn:faults", "Denied"}};
+  options.dialect.acceptsAnyResponse = true;
+  const auto service = CreateSecurityTokenService(ConfigFor(server.GetUrl()), options);
+  EXPECT_NE(service->AcquireToken("alice@corp.example", "pass", Spec()), nullptr);
+  const std::string request = server.GetRequests().at(0);
+  EXPECT_NE(request.find("\r\nContent-Type: text/xml; charset=utf-8\r\n"), std::string::npos) << request;
+  EXPECT_NE(request.find(">" + server.GetUrl() + "</wsa:To>"), std::string::npos) << request;
+  EXPECT_NE(request.find("<wsa:Address>urn:service</wsa:Address>"), std::string::npos) << request;
+  EXPECT_THROWS_MESSAGE(service->AcquireToken("alice@corp.example", "pass", Spec()), InvalidCredentialsException,
+                        "Authentication failed");
+}
+
+TEST(CreateSecurityTokenService, DeclaresNoCharsetByDefault) {
+  const PostingServer server({Issued()});
+  CreateSecurityTokenService(ConfigFor(server.GetUrl()))->AcquireToken("alice@corp.example", "pass", Spec());
+  const std::string request = server.GetRequests().at(0);
+  EXPECT_NE(request.find("\r\nContent-Type: text/xml\r\n"), std::string::npos) << request;
+}
+
+TEST(CreateSecurityTokenService, RefusesADialectThatContradictsItself) {
+  ServiceOptions options;
+  options.dialect.tokenType = "urn:oasis:names:tc:SAML:1.1:assertion";
+  EXPECT_THROWS_MESSAGE(CreateSecurityTokenService(ConfigFor("http://localhost/"), options),
+                        Tarvel::InvalidArgumentException,
+                        "Invalid argument : ServiceDialect::tokenType asks for tokens that this client cannot read, "
+                        "which are not SAML 2.0: \"urn:oasis:names:tc:SAML:1.1:assertion\"");
+}
+
+TEST(CreateSecurityTokenService, SendsNothingWhenTheDialectCannotStateWhatTheSpecAsksFor) {
+  const PostingServer server({Issued()});
+  ServiceOptions options;
+  options.dialect.delegatable = ServiceDialect::Statement::NEVER;
+  TokenSpec spec = Spec();
+  spec.delegable = true;
+  EXPECT_THROWS_MESSAGE(
+      CreateSecurityTokenService(ConfigFor(server.GetUrl()), options)->AcquireToken("alice", "pass", spec),
+      Tarvel::InvalidArgumentException,
+      "Invalid argument : TokenSpec::delegable is true, but the dialect of the service has no wst:Delegatable");
+  EXPECT_TRUE(server.GetRequests().empty());
+}
+
 TEST(CreateSecurityTokenService, SignsRequestsWithTheHolderOfKeyIdentity) {
   const PostingServer server({Issued()});
   SecurityTokenServiceConfig config = ConfigFor(server.GetUrl());
