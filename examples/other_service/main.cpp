@@ -2,8 +2,8 @@
 /// @file
 /// Gets a token from an Apache CXF service, renews, validates and exchanges it, and prints what each token says.
 ///
-/// Usage: STS_URL=https://sts.corp.example/sts STS_CA=ca.pem STS_CERT=sts.pem STS_USER=alice STS_PASSWORD=... \
-///        other_service client.pem client.key
+/// Usage: other_service client.pem client.key, with the variables STS_URL (the service's endpoint), STS_CA (PEM: the authority of
+/// its web server), STS_CERT (PEM: the certificates that it signs tokens with), STS_USER and STS_PASSWORD
 ///
 /// A password in the environment can be read by other processes of the same user; the example `acquire` shows a better way.
 
