@@ -43,14 +43,16 @@ ExitCode Acquire(const AcquireOptions &options, const OutputOptions &output) {
   CheckTokenOutput(options.tokenOutput, output);
 
   const Tarvel::Crypto::CertificateList trusted = LoadTrusted(options.trust, output);
-  RefusedToken refused(options.tokenOutput, output);
+  const VerifyOptions verifyOptions = VerifyOptionsOf(options.trust);
+  RefusedToken refused(options.tokenOutput, trusted, verifyOptions, output);
+  serviceOptions.verifyOptions.profile = verifyOptions.profile; // the tolerance is checked below
   serviceOptions.observer = ObserverFor(output);
   serviceOptions.refusedTokenSink = refused.GetSink();
   const auto service = CreateService(options.connection, trusted, LoadIdentity(options.identity), serviceOptions);
   const IssuedToken issued = refused.Explain([&] {
-    IssuedToken acquired = kind.acquire({*service, spec, hasIdentity, options.credentials, options.connection.url,
-                                         trusted, options.trust.toleranceSec, output});
-    RequireWithinTolerance(*acquired.token, trusted, options.trust.toleranceSec, refused.GetSink());
+    IssuedToken acquired = kind.acquire(
+        {*service, spec, hasIdentity, options.credentials, options.connection.url, trusted, verifyOptions, output});
+    RequireWithinTolerance(*acquired.token, trusted, verifyOptions, refused.GetSink());
     return acquired;
   });
   WriteToken(issued, spec, serviceOptions.dialect, options.trust.toleranceSec, options.tokenOutput, output);

@@ -44,15 +44,17 @@ ExitCode Renew(const RenewOptions &options, const OutputOptions &output) {
   CheckTokenOutput(options.tokenOutput, output);
 
   const Tarvel::Crypto::CertificateList trusted = LoadTrusted(options.trust, output);
-  const auto given = ReadToken(options.file, trusted, options.trust.toleranceSec);
-  RefusedToken refused(options.tokenOutput, output);
+  const VerifyOptions verifyOptions = VerifyOptionsOf(options.trust);
+  const auto given = ReadToken(options.file, trusted, verifyOptions);
+  RefusedToken refused(options.tokenOutput, trusted, verifyOptions, output);
+  serviceOptions.verifyOptions.profile = verifyOptions.profile; // the tolerance is checked below
   serviceOptions.observer = ObserverFor(output);
   serviceOptions.refusedTokenSink = refused.GetSink();
   const auto service = CreateService(options.connection, trusted, LoadIdentity(options.identity), serviceOptions);
   const IssuedToken issued = refused.Explain([&] {
     IssuedToken renewed =
         AskForToken([&] { return service->RenewToken(*given, spec.tokenLifetimeSec); }, nullptr, output);
-    RequireWithinTolerance(*renewed.token, trusted, options.trust.toleranceSec, refused.GetSink());
+    RequireWithinTolerance(*renewed.token, trusted, verifyOptions, refused.GetSink());
     return renewed;
   });
   WriteToken(issued, spec, serviceOptions.dialect, options.trust.toleranceSec, options.tokenOutput, output);

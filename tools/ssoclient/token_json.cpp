@@ -2,6 +2,7 @@
 /// @file
 /// The JSON of a token.
 
+#include "details_view.h"
 #include "time_text.h"
 #include "token_view.h"
 
@@ -71,9 +72,9 @@ Json ArrayOf(const Items &items) {
   return array;
 }
 
-/// All keys are in this place, because callers rely on the keys and their order: a change to either needs a new
-/// "schema".
-Json FactsJson(const TokenFacts &facts) {
+/// These keys and those of `AddDetails` are in one place each, because callers rely on the keys and their order: a change
+/// to either needs a new "schema".
+Json BasicFactsJson(const TokenFacts &facts) {
   return {{"id", OrNull(facts.id)},
           {"subject", OrNull(facts.subject)},
           {"confirmation", OrNull(facts.confirmation)},
@@ -88,6 +89,12 @@ Json FactsJson(const TokenFacts &facts) {
           {"audience", ArrayOf(facts.audience)},
           {"advice", ArrayOf(facts.advice)},
           {"certificate", OrNull(facts.certificate)}};
+}
+
+Json FactsJson(const TokenFacts &facts) {
+  Json json = BasicFactsJson(facts);
+  AddDetails(facts.details, json);
+  return json;
 }
 
 /// `facts` with null for every value.

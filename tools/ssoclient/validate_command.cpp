@@ -39,7 +39,7 @@ ExitCode Validate(const ValidateOptions &options, const OutputOptions &output) {
   serviceOptions.observer = ObserverFor(output);
 
   const Tarvel::Crypto::CertificateList trusted = LoadTrusted(options.trust, output);
-  const auto token = ReadToken(options.file, trusted, options.trust.toleranceSec);
+  const auto token = ReadToken(options.file, trusted, VerifyOptionsOf(options.trust));
   const auto service = CreateService(options.connection, trusted, boost::none, serviceOptions);
   const bool isValid = CallService([&] { return service->ValidateSubject(*token); });
   WriteOutput(RenderVerdict(isValid, output.format));
