@@ -50,8 +50,8 @@ ExitCode Acquire(const AcquireOptions &options, const OutputOptions &output) {
   serviceOptions.refusedTokenSink = refused.GetSink();
   const auto service = CreateService(options.connection, trusted, LoadIdentity(options.identity), serviceOptions);
   const IssuedToken issued = refused.Explain([&] {
-    IssuedToken acquired = kind.acquire(
-        {*service, spec, hasIdentity, options.credentials, options.connection.url, trusted, verifyOptions, output});
+    IssuedToken acquired = kind.acquire({*service, spec, serviceOptions.dialect, hasIdentity, options.credentials,
+                                         options.connection.url, trusted, verifyOptions, output});
     RequireWithinTolerance(*acquired.token, trusted, verifyOptions, refused.GetSink());
     return acquired;
   });

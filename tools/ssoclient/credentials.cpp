@@ -19,10 +19,12 @@ constexpr Doubt EXCHANGE_OF_BEARER_TOKEN = {
     "the token to exchange is a bearer token; services refuse to exchange those",
     "an exchange needs a holder-of-key token; acquire one with the identity, and without --bearer"};
 
-/// A request for a delegated token is not signed, even when it asks for a token that is bound to a key.
+/// A request for a delegated token is not signed, even when it asks for a token that is bound to a key. Services that
+/// take the key from the certificate in wst:UseKey may grant it nevertheless.
 const Doubt *DoubtAboutDelegation(const AcquireCall &call) {
   const bool asksForBoundToken = call.hasIdentity && call.spec.confirmation == TokenSpec::CONFIRMATION_DEFAULT;
-  return asksForBoundToken && call.spec.delegateTo ? &DELEGATION_WITHOUT_PROOF : nullptr;
+  const bool containsCertificate = call.dialect.useKey == ServiceDialect::UseKey::CERTIFICATE;
+  return asksForBoundToken && call.spec.delegateTo && !containsCertificate ? &DELEGATION_WITHOUT_PROOF : nullptr;
 }
 
 void CheckNothing(const TokenSpec &, bool) {}

@@ -11,6 +11,7 @@
 #include "trust.h"
 
 #include <ssoclient/security_token_service.h>
+#include <ssoclient/service_dialect.h>
 #include <ssoclient/token_spec.h>
 
 #include <cstdint>
@@ -33,6 +34,7 @@ struct CredentialsOptions {
 struct AcquireCall {
   const SecurityTokenService &service;
   const TokenSpec &spec;
+  const ServiceDialect &dialect;
   bool hasIdentity;
   const CredentialsOptions &credentials;
   const std::string &url; ///< of the service

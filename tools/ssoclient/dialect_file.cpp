@@ -109,20 +109,29 @@ const std::string &RequireText(const std::string &key, const std::string &wanted
   return value.get_ref<const std::string &>();
 }
 
+constexpr const char *FAULT_FORM = "the texts \"namespace\" and \"name\"";
+
+[[noreturn]] void RefuseFaultKey(const std::string &key, const std::string &unknown) {
+  throw DialectProblem(key + ": unknown key \"" + unknown + "\"; the keys are namespace and name");
+}
+
+const std::string &ReadFaultText(const std::string &key, const Json &fault, const char *part) {
+  if (!fault.contains(part)) {
+    throw DialectProblem(key + ": each element: must have " + FAULT_FORM);
+  }
+  return RequireText(key + ": " + part, "a text", fault[part]);
+}
+
 FaultName ReadFault(const std::string &key, const Json &value) {
   if (!value.is_object()) {
-    RefuseValue(key + ": each element", "an object with the texts \"namespace\" and \"name\"", value);
+    RefuseValue(key + ": each element", std::string("an object with ") + FAULT_FORM, value);
   }
-  for (const auto &[member, content] : value.items()) {
-    if (member != NAMESPACE && member != NAME) {
-      throw DialectProblem(key + ": unknown key \"" + member + "\"; the keys are namespace and name");
+  for (const auto &[part, text] : value.items()) {
+    if (part != NAMESPACE && part != NAME) {
+      RefuseFaultKey(key, part);
     }
-    RequireText(key + ": " + member, "a text", content);
   }
-  if (value.size() != 2) {
-    throw DialectProblem(key + ": each element: must have the texts \"namespace\" and \"name\"");
-  }
-  return {value[NAMESPACE].get<std::string>(), value[NAME].get<std::string>()};
+  return {ReadFaultText(key, value, NAMESPACE), ReadFaultText(key, value, NAME)};
 }
 
 void ReadFaults(const std::string &key, const Json &value, ServiceDialect &dialect) {

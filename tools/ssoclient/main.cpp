@@ -34,6 +34,8 @@ constexpr Command COMMANDS[] = {
      "      --cert client.pem --key client.key --renewable --delegable --out client.xml\n"
      "  ssoclient acquire --sts https://sts.corp.example/sts --ca ca.pem --trust sts.pem \\\n"
      "      --cert client.pem --key client.key --token client.xml --delegate-to bob@corp.example --lifetime 15m\n"
+     "  ssoclient acquire --sts https://sts.corp.example/sts --ca ca.pem --trust sts.pem \\\n"
+     "      --user alice@corp.example --password-file password.txt --dialect cxf\n"
      "  ssoclient acquire --sts https://sts.corp.example/sts --ca ca.pem --trust sts.pem --gss\n"
      "  ssoclient acquire --sts https://sts.corp.example/sts --ca ca.pem --trust sts.pem \\\n"
      "      --gss --service HTTP/sts.corp.example@CORP.EXAMPLE --client-keytab robot.keytab\n",
@@ -59,8 +61,8 @@ constexpr Command COMMANDS[] = {
      "  ssoclient doctor --sts https://sts.corp.example/sts --ca ca.pem --timeout 5 --format json\n",
      DefineDoctor},
     {"dialect", "List the dialects of services that are known, or write one as a file that can be edited",
-     "  ssoclient dialect\n"
-     "  ssoclient dialect cxf\n",
+     "  ssoclient dialect --format json\n"
+     "  ssoclient dialect cxf >partner.json; ssoclient dialect partner.json\n",
      DefineDialect},
 };
 

@@ -26,4 +26,8 @@ std::string ExampleAcquirePath() {
   return EXAMPLE_ACQUIRE;
 }
 
+std::string ExampleOtherServicePath() {
+  return EXAMPLE_OTHER_SERVICE;
+}
+
 } // namespace ToolTest

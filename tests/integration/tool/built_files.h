@@ -23,4 +23,7 @@ std::string SearchingMemoryPath();
 /// The path of the example that acquires a token by password.
 std::string ExampleAcquirePath();
 
+/// The path of the example that uses a service of another maker.
+std::string ExampleOtherServicePath();
+
 } // namespace ToolTest

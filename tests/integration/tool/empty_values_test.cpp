@@ -17,7 +17,7 @@ namespace {
 
 using testing::IsSupersetOf;
 
-const char *const COMMANDS[] = {"acquire", "renew", "validate", "verify", "inspect", "doctor"};
+const char *const COMMANDS[] = {"acquire", "renew", "validate", "verify", "inspect", "doctor", "dialect"};
 
 class EmptyValue : public testing::TestWithParam<const char *> {};
 
@@ -40,20 +40,28 @@ INSTANTIATE_TEST_SUITE_P(Of, EmptyValue, testing::ValuesIn(COMMANDS),
 
 TEST(EmptyValue, IsTestedForTheOptionsThatTakeAnArgument) {
   const std::set<std::string> options = OptionsWithArgument("acquire");
-  EXPECT_THAT(options, IsSupersetOf({"--sts",           "--ca",       "--thumbprint",    "--trust",
-                                     "--tolerance",     "--user",     "--password-file", "--password-fd",
-                                     "--token",         "--service",  "--ccache",        "--client-keytab",
-                                     "--cert",          "--key",      "--p12",           "--passphrase-file",
-                                     "--passphrase-fd", "--lifetime", "--audience",      "--delegate-to",
-                                     "--advice",        "--out",      "--format",        "--save-refused"}));
-  for (const char *flag :
-       {"--help", "--verbose", "--allow-http", "--gss", "--delegable", "--renewable", "--bearer", "--force"}) {
+  EXPECT_THAT(options, IsSupersetOf({"--sts",           "--ca",
+                                     "--thumbprint",    "--trust",
+                                     "--tolerance",     "--user",
+                                     "--password-file", "--password-fd",
+                                     "--token",         "--service",
+                                     "--ccache",        "--client-keytab",
+                                     "--cert",          "--key",
+                                     "--p12",           "--passphrase-file",
+                                     "--passphrase-fd", "--lifetime",
+                                     "--audience",      "--delegate-to",
+                                     "--advice",        "--out",
+                                     "--format",        "--save-refused",
+                                     "--dialect",       "--dialect-switch",
+                                     "--applies-to"}));
+  for (const char *flag : {"--help", "--verbose", "--allow-http", "--gss", "--delegable", "--renewable", "--bearer",
+                           "--force", "--addressing"}) {
     EXPECT_EQ(0u, options.count(flag)) << flag;
   }
 }
 
 TEST(EmptyValue, AfterOtherValuesIsAWrongCommandLine) {
-  for (const std::string option : {"--trust", "--audience", "--advice"}) {
+  for (const std::string option : {"--trust", "--audience", "--advice", "--dialect-switch"}) {
     ExpectResult(RunTool({"acquire", option, "a:b=c", option, "", option, "a:b=c"}), 2, "",
                  "ssoclient: usage: " + option + ": must not be empty; see ssoclient --help\n");
   }

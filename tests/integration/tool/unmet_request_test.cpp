@@ -149,6 +149,13 @@ TEST_F(DoubtfulRequest, ForADelegatedTokenWithAnIdentityIsSentWithAWarningAndRef
   EXPECT_THAT(bearer.out, HasSubstr("\nDelegate:        bob@corp.example at "));
 }
 
+TEST_F(DoubtfulRequest, IsNotOneThatContainsTheCertificateSinceSomeServicesGrantIt) {
+  ExpectResult(Run("ssoclient acquire " + Service() + PASSWORD + IDENTITY +
+                   "--delegate-to bob@corp.example --dialect-switch use-key=certificate"),
+               8, "", "ssoclient: service fault: Unexpected SOAP fault: wst:InvalidRequest; request failed.\n");
+  EXPECT_THAT(m_service.GetLog(), HasSubstr("the request asks for a holder-of-key token without proof of a key"));
+}
+
 TEST_F(DoubtfulRequest, OfABearerTokensExchangeIsSentWithAWarningAndRefusedWithAHint) {
   Acquire("bearer.xml", std::string(PASSWORD) + "--delegable");
   const std::string line = "ssoclient acquire " + Service() + IDENTITY + "--token bearer.xml ";
