@@ -2,14 +2,13 @@
 package interop;
 
 import java.io.IOException;
+import java.io.OutputStream;
 import java.net.BindException;
 import java.net.ServerSocket;
 import java.nio.file.Path;
-import java.util.Collection;
 import java.util.HashMap;
 import java.util.List;
 import java.util.Map;
-import java.util.stream.Collectors;
 import java.util.stream.Stream;
 import javax.xml.namespace.QName;
 import org.apache.cxf.Bus;
@@ -24,6 +23,7 @@ import org.apache.cxf.sts.operation.TokenRenewOperation;
 import org.apache.cxf.sts.operation.TokenValidateOperation;
 import org.apache.cxf.sts.service.StaticService;
 import org.apache.cxf.sts.token.delegation.UsernameTokenDelegationHandler;
+import org.apache.cxf.sts.token.provider.ActAsAttributeStatementProvider;
 import org.apache.cxf.sts.token.provider.SAMLTokenProvider;
 import org.apache.cxf.sts.token.renewer.SAMLTokenRenewer;
 import org.apache.cxf.sts.token.validator.SAMLTokenValidator;
@@ -70,7 +70,7 @@ public final class TokenService {
   public static void main(String[] arguments) throws Exception {
     final TokenService service = start(Path.of(arguments[0]));
     System.out.println(service.address);
-    System.in.transferTo(java.io.OutputStream.nullOutputStream());
+    System.in.transferTo(OutputStream.nullOutputStream());
     System.exit(0);
   }
 
@@ -169,7 +169,7 @@ public final class TokenService {
     properties.setSignatureUsername(KEY_ALIAS);
     properties.setCallbackHandler(users);
     final SAMLTokenProvider tokens = new SAMLTokenProvider();
-    tokens.setAttributeStatementProviders(List.of(new GroupStatement(users)));
+    tokens.setAttributeStatementProviders(List.of(new GroupStatement(users), new ActAsAttributeStatementProvider()));
     operation.setStsProperties(properties);
     operation.setTokenProviders(List.of(tokens));
     operation.setTokenStore(issuedTokens);
