@@ -106,6 +106,7 @@ public final class TokenService {
     publishPlain("/plain/timestamp", "Timestamp");
 
     // With a policy, the WSDL has it: what is written here is what WS-SecurityPolicy has no words for.
+    publishPolicy("/sts", "sts", Map.of());
     publishPolicy("/ut", "ut", Map.of());
     publishPolicy("/x509", "x509", Map.of());
     publishPolicy("/ut-x509", "ut-x509", Map.of());
