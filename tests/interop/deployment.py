@@ -3,6 +3,7 @@
 
 import pathlib
 import subprocess
+import threading
 
 # Names that neither US-ASCII nor ISO-8859-1 has, as a user, in a password and as a group.
 USER = "jürgen€@corp.example"
@@ -10,6 +11,8 @@ PASSWORD = "paßwörter"
 GROUPS = [{"name": "Kölner €", "domain": "corp"}, {"name": "users", "domain": ""}]
 OTHER_USER = "bób"
 CERTIFICATE_SUBJECT = "CN=Jürgen €,O=Beispiel"
+
+START_SEC = 120  # how long the service may take to start
 
 # A version 3 certificate, which WS-SecurityPolicy's WssX509V3Token10 requires, has extensions.
 EXTENSIONS = "basicConstraints=CA:FALSE\n"
@@ -59,7 +62,10 @@ class TokenService:
         self._process = subprocess.Popen(
             ["java", "-cp", f"{libraries}/classes:{libraries}/lib/*", "interop.TokenService", str(folder)],
             stdin=subprocess.PIPE, stdout=subprocess.PIPE, stderr=self._log, text=True)
+        watch = threading.Timer(START_SEC, self._process.kill)
+        watch.start()
         self.url = self._process.stdout.readline().strip()
+        watch.cancel()
         if not self.url:
             self.close()
             raise RuntimeError("the token service does not start:\n" + (folder / "service.log").read_text(encoding="utf-8"))

@@ -6,6 +6,7 @@ import relay
 from row import SERVICE_FAULT, TOKEN_INVALID, Row
 
 BY_PASSWORD = ["acquire", "--user", deployment.USER, "--password-file", "password"]
+WRONG_PASSWORD = ["acquire", "--user", deployment.USER, "--password-file", "wrong-password"]
 IDENTITY = ["--cert", "client.pem", "--key", "client.key"]
 QUALIFIER = ";name-qualifier=http://cxf.apache.org/sts"
 
@@ -144,11 +145,10 @@ def validate_rows():
 
 def wrong_password_rows():
     """A wrong password is recognised where the service reports it by a name that the dialect knows."""
-    wrong = ["acquire", "--user", deployment.USER, "--password-file", "wrong-password"]
     return [
-        Row("issue by a wrong password", "bearer", "/ut", wrong, code=SERVICE_FAULT, fault="SecurityError",
+        Row("issue by a wrong password", "bearer", "/ut", WRONG_PASSWORD, code=SERVICE_FAULT, fault="SecurityError",
             reason="the service reports a general security error"),
-        Row("issue by a wrong password", "bearer", "/fault-names", wrong, code=3, fault="FailedAuthentication",
+        Row("issue by a wrong password", "bearer", "/fault-names", WRONG_PASSWORD, code=3, fault="FailedAuthentication",
             reason="the service reports the failed authentication"),
     ]
 
@@ -158,19 +158,22 @@ def switch_rows():
     by_both = BY_PASSWORD + IDENTITY
     exchange = ["acquire", "--token", "key.xml", *IDENTITY]
 
-    def without(switch, endpoint, arguments, confirmation, fault):
-        return Row(f"with `{switch}`", confirmation, endpoint, arguments + ["--dialect-switch", switch], code=SERVICE_FAULT,
-                   fault=fault, reason="the service needs the dialect's value")
+    def without(switch, operation, confirmation, endpoint, arguments, fault):
+        return Row(f"{operation}, with `{switch}`", confirmation, endpoint, arguments + ["--dialect-switch", switch],
+                   code=SERVICE_FAULT, fault=fault, reason="the service needs the dialect's value")
 
+    delegated = BY_PASSWORD + ["--delegate-to", deployment.OTHER_USER, "--bearer"]
     return [
-        without("delegatable=always", "/ut", BY_PASSWORD, "bearer", "BadRequest"),
-        without("use-key=reference", "/ut-x509", by_both, "holder-of-key", "BadRequest"),
-        without("use-key=never", "/ut-x509", by_both, "holder-of-key", "InvalidRequest"),
-        without("use-key=reference", "/saml", exchange, "holder-of-key", "InvalidRequest"),
-        without("token-type-reference=established", "/saml", exchange, "holder-of-key", "SecurityError"),
-        without("delegation=delegate-to", "/ut", BY_PASSWORD + ["--delegate-to", deployment.OTHER_USER, "--bearer"], "bearer",
-                "BadRequest"),
-        without("addressing=false", "/addressing", BY_PASSWORD, "bearer", "MessageAddressingHeaderRequired"),
+        without("delegatable=always", "issue by password", "bearer", "/ut", BY_PASSWORD, "BadRequest"),
+        without("use-key=reference", "issue by password, with an identity", "holder-of-key", "/ut-x509", by_both, "BadRequest"),
+        without("use-key=never", "issue by password, with an identity", "holder-of-key", "/ut-x509", by_both, "InvalidRequest"),
+        without("use-key=reference", "issue by token", "holder-of-key", "/saml", exchange, "InvalidRequest"),
+        without("token-type-reference=established", "issue by token", "holder-of-key", "/saml", exchange, "SecurityError"),
+        without("delegation=delegate-to", "issue by password, on behalf of a user", "bearer", "/ut", delegated, "BadRequest"),
+        without("addressing=false", "issue by password", "bearer", "/addressing", BY_PASSWORD,
+                "MessageAddressingHeaderRequired"),
+        without("credential-faults=none", "issue by a wrong password", "bearer", "/fault-names", WRONG_PASSWORD,
+                "FailedAuthentication"),
     ]
 
 
