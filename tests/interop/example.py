@@ -16,9 +16,11 @@ def failures(root, build, folder, url):
     """Compiles and runs the program. Returns what is wrong, or nothing."""
     libraries = [build.resolve() / "src", build.resolve() / "tarvel"]
     paths = [option for library in libraries for option in (f"-L{library}", f"-Wl,-rpath,{library}")]
-    subprocess.run(["g++", "-std=c++17", f"-I{root}/include", f"-I{root}/tarvel/include",
-                    root / "examples" / "other_service" / "main.cpp", *paths, "-lssoclient", "-ltarvel", "-o",
-                    folder / "other_service"], check=True)
+    compiled = subprocess.run(
+        ["g++", "-std=c++17", f"-I{root}/include", f"-I{root}/tarvel/include", root / "examples" / "other_service" / "main.cpp",
+         *paths, "-lssoclient", "-ltarvel", "-o", folder / "other_service"], capture_output=True, text=True, check=False)
+    if compiled.returncode != 0:
+        return [f"interop: examples/other_service does not compile: {compiled.stderr}"]
     environment = {**os.environ, "STS_URL": url + "/sts", "STS_CA": "ca.pem", "STS_CERT": "sts.pem",
                    "STS_USER": deployment.USER, "STS_PASSWORD": deployment.PASSWORD}
     done = subprocess.run([folder / "other_service", "client.pem", "client.key"], cwd=folder, env=environment,
