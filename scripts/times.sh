@@ -5,8 +5,11 @@
 step_rows=()
 failed_steps=()
 
+# What a step returns that cannot run on this machine, and has said why.
+SKIPPED=77
+
 # run_step NAME COMMAND…: runs the command in a subshell, which ends at the first command that fails. Always succeeds itself;
-# a step that failed is added to failed_steps.
+# a step that failed is added to failed_steps. A step that is skipped did not fail, and did not pass.
 run_step() {
   local name="$1" started=$SECONDS result=passed status
   shift
@@ -14,7 +17,9 @@ run_step() {
   (set -e; "$@")
   status=$?
   set -e
-  if [[ $status -ne 0 ]]; then
+  if [[ $status -eq $SKIPPED ]]; then
+    result=skipped
+  elif [[ $status -ne 0 ]]; then
     result=FAILED
     failed_steps+=("$name")
   fi
