@@ -8,15 +8,36 @@ from row import SERVICE_FAULT, TOKEN_INVALID, Row
 BY_PASSWORD = ["acquire", "--user", deployment.USER, "--password-file", "password"]
 WRONG_PASSWORD = ["acquire", "--user", deployment.USER, "--password-file", "wrong-password"]
 IDENTITY = ["--cert", "client.pem", "--key", "client.key"]
-QUALIFIER = ";name-qualifier=http://cxf.apache.org/sts"
+NAME_QUALIFIER = "http://cxf.apache.org/sts"
+SAML11, SAML20 = "urn:oasis:names:tc:SAML:1.1:nameid-format:", "urn:oasis:names:tc:SAML:2.0:nameid-format:"
+PERSISTENT, X509_SUBJECT, UNSPECIFIED = SAML20 + "persistent", SAML11 + "X509SubjectName", SAML11 + "unspecified"
+KEYS = {PERSISTENT: "persistent", X509_SUBJECT: "x509-subject", UNSPECIFIED: "unspecified"}
 
-USER = {"subject": {"name": deployment.USER, "domain": "nameid:persistent" + QUALIFIER}, "groups": deployment.GROUPS}
-CERTIFICATE = {"subject": {"name": deployment.CERTIFICATE_SUBJECT, "domain": "nameid:x509-subject" + QUALIFIER}, "groups": []}
-# The service writes the subject of a token that was made from another one without a format.
-OF_USER_TOKEN = {**USER, "subject": {"name": deployment.USER, "domain": "nameid:unspecified" + QUALIFIER}}
-OF_CERTIFICATE_TOKEN = {
-    **CERTIFICATE, "subject": {"name": deployment.CERTIFICATE_SUBJECT, "domain": "nameid:unspecified" + QUALIFIER}}
-OTHER_USER = {"subject": {"name": deployment.OTHER_USER, "domain": "nameid:unspecified" + QUALIFIER}, "groups": []}
+
+def about(name, name_format, groups):
+    """The facts of a token's subject."""
+    name_id = {"value": name, "format": name_format, "nameQualifier": NAME_QUALIFIER, "spNameQualifier": None,
+               "spProvidedId": None}
+    principal = {"name": name, "domain": f"nameid:{KEYS[name_format]};name-qualifier={NAME_QUALIFIER}"}
+    return {"subject": principal, "nameId": name_id, "groups": groups}
+
+
+USER = about(deployment.USER, PERSISTENT, deployment.GROUPS)
+CERTIFICATE = about(deployment.CERTIFICATE_SUBJECT, X509_SUBJECT, [])
+# The service writes another format when a token, and not a credential, names the subject.
+OF_USER_TOKEN = about(deployment.USER, UNSPECIFIED, deployment.GROUPS)
+OF_CERTIFICATE_TOKEN = about(deployment.CERTIFICATE_SUBJECT, UNSPECIFIED, [])
+OTHER_USER = about(deployment.OTHER_USER, UNSPECIFIED, [])
+
+def attribute(name, name_format, friendly_name, *values):
+    """An attribute with values that are text."""
+    return {"name": name, "nameFormat": name_format, "friendlyName": friendly_name,
+            "values": [{"text": value, "xml": False, "nil": False} for value in values]}
+
+
+GROUPS = attribute("http://www.rsa.com/schemas/attr-names/2009/01/GroupIdentity",
+                   "urn:oasis:names:tc:SAML:2.0:attrname-format:uri", "groups", "corp\\Kölner €", "users")
+ACTED_AS = attribute("ActAs", NAME_QUALIFIER, None, deployment.OTHER_USER)
 
 BEARER = {"confirmation": "bearer"}
 HOLDER_OF_KEY = {"confirmation": "holder-of-key"}
@@ -90,8 +111,8 @@ def delegation_rows(by_certificate):
                  BY_PASSWORD + ["--delegate-to", "mallory", "--bearer"], code=SERVICE_FAULT, fault="RequestFailed",
                  reason="the service does not permit it"),
              Row("issue by password, to act as a user", "bearer", "/ut",
-                 BY_PASSWORD + to_other + ["--bearer", "--dialect-switch", "delegation=act-as"], {**USER, **BEARER}, "unused.xml",
-                 PASSWORD_CHANGES)]
+                 BY_PASSWORD + to_other + ["--bearer", "--dialect-switch", "delegation=act-as"],
+                 {**USER, **BEARER, "attributes": [GROUPS, ACTED_AS]}, "unused.xml", PASSWORD_CHANGES)]
     return rows
 
 

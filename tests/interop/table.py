@@ -26,4 +26,6 @@ def written(outcomes):
         result = "works" if row.code == 0 else f"refused, exit {row.code} (`{row.fault}`): {row.reason}"
         changed = ", ".join(outcome.changed) or "-"
         lines.append(f"| {row.operation} | {row.confirmation} | {ENDPOINTS[row.endpoint]} | {result} | {changed} |")
+    lines.append(f"| `examples/other_service`: issue by password, renew, validate, issue by token | holder-of-key | "
+                 f"{ENDPOINTS['/sts']} | works | - |")
     return "\n".join(lines) + "\n"
