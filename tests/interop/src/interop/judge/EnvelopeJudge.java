@@ -1,0 +1,220 @@
+// SPDX-License-Identifier: Apache-2.0
+package interop.judge;
+
+import java.io.ByteArrayInputStream;
+import java.io.IOException;
+import java.nio.charset.StandardCharsets;
+import java.security.KeyStore;
+import java.util.ArrayList;
+import java.util.Collections;
+import java.util.IdentityHashMap;
+import java.util.List;
+import java.util.Map;
+import java.util.Set;
+import java.util.TreeSet;
+import java.util.stream.Collectors;
+import javax.security.auth.callback.Callback;
+import javax.security.auth.callback.CallbackHandler;
+import javax.xml.namespace.QName;
+import javax.xml.stream.XMLInputFactory;
+import javax.xml.stream.XMLStreamReader;
+import org.apache.wss4j.common.bsp.BSPRule;
+import org.apache.wss4j.common.crypto.AlgorithmSuite;
+import org.apache.wss4j.common.crypto.Merlin;
+import org.apache.wss4j.common.ext.WSPasswordCallback;
+import org.apache.wss4j.common.ext.WSSecurityException;
+import org.apache.wss4j.dom.WSConstants;
+import org.apache.wss4j.dom.WSDataRef;
+import org.apache.wss4j.dom.engine.WSSConfig;
+import org.apache.wss4j.dom.engine.WSSecurityEngine;
+import org.apache.wss4j.dom.engine.WSSecurityEngineResult;
+import org.apache.wss4j.dom.handler.RequestData;
+import org.apache.wss4j.dom.handler.WSHandlerResult;
+import org.apache.wss4j.stax.ext.WSSConstants;
+import org.apache.wss4j.stax.ext.WSSSecurityProperties;
+import org.apache.wss4j.stax.securityEvent.SignedPartSecurityEvent;
+import org.apache.wss4j.stax.securityEvent.WSSecurityEventConstants;
+import org.apache.wss4j.stax.setup.WSSec;
+import org.apache.xml.security.stax.securityEvent.AbstractElementSecurityEvent;
+import org.apache.xml.security.stax.securityEvent.SecurityEvent;
+import org.apache.xml.security.stax.securityEvent.SignatureValueSecurityEvent;
+import org.apache.xml.security.stax.securityEvent.SignedElementSecurityEvent;
+import org.w3c.dom.Document;
+import org.w3c.dom.Element;
+import org.w3c.dom.Node;
+
+/** Judges a request as a service does, with the two engines of WSS4J, and then checks what exactly is signed. */
+final class EnvelopeJudge {
+  static final String VERIFIES = "verifies";
+
+  private static final String RSA_SHA256 = "http://www.w3.org/2001/04/xmldsig-more#rsa-sha256";
+  private static final String SHA256 = "http://www.w3.org/2001/04/xmlenc#sha256";
+  private static final String EXCLUSIVE = "http://www.w3.org/2001/10/xml-exc-c14n#";
+  private static final String ENVELOPED = "http://www.w3.org/2000/09/xmldsig#enveloped-signature";
+  private static final int SHORTEST_KEY = 2048;
+
+  /** What a request must have: which users, and whether it is signed. */
+  record Expected(boolean isSigned, boolean hasUsername, boolean followsBasicSecurityProfile) {
+  }
+
+  private final Merlin trusted = new Merlin();
+  private final Map<String, String> passwords;
+
+  EnvelopeJudge(KeyStore trustedCertificates, Map<String, String> passwords) {
+    trusted.setTrustStore(trustedCertificates);
+    this.passwords = passwords;
+  }
+
+  /** VERIFIES, or the reason why not. */
+  String judgeAsTree(String envelope, Expected expected) {
+    try {
+      Document document = Xml.parse(envelope);
+      WSHandlerResult result = new WSSecurityEngine().processSecurityHeader(document, requestData(expected));
+      if (result == null) {
+        return "no security header";
+      }
+      return checkResults(document, result, expected);
+    } catch (WSSecurityException refusal) {
+      return refusal.getMessage();
+    } catch (Exception failure) {
+      return failure.toString();
+    }
+  }
+
+  /** The same with the engine that reads a stream. */
+  String judgeAsStream(String envelope, Expected expected) {
+    List<SecurityEvent> events = new ArrayList<>();
+    try {
+      WSSSecurityProperties properties = new WSSSecurityProperties();
+      properties.setSignatureVerificationCrypto(trusted);
+      properties.setCallbackHandler(passwordCallback());
+      properties.setUsernameTokenPasswordType(WSSConstants.UsernameTokenPasswordType.PASSWORD_TEXT);
+      properties.setRequireTimestampExpires(true);
+      properties.setValidateSamlSubjectConfirmation(true);
+      if (!expected.followsBasicSecurityProfile()) {
+        properties.addIgnoreBSPRule(BSPRule.R6617);
+      }
+      XMLStreamReader plain = XMLInputFactory.newInstance().createXMLStreamReader(
+        new ByteArrayInputStream(envelope.getBytes(StandardCharsets.UTF_8)));
+      XMLStreamReader reader = WSSec.getInboundWSSec(properties).processInMessage(plain, null, events::add);
+      while (reader.hasNext()) {
+        reader.next();
+      }
+      return checkEvents(events, Xml.parse(envelope), expected);
+    } catch (Exception failure) {
+      return failure.getMessage() == null ? failure.toString() : failure.getMessage();
+    }
+  }
+
+  private RequestData requestData(Expected expected) {
+    RequestData data = new RequestData();
+    data.setWssConfig(WSSConfig.getNewInstance());
+    data.setSigVerCrypto(trusted);
+    data.setCallbackHandler(passwordCallback());
+    data.setDisableBSPEnforcement(!expected.followsBasicSecurityProfile());
+    data.setRequiredPasswordType(WSConstants.PASSWORD_TEXT);
+    data.setRequireTimestampExpires(true);
+    data.setValidateSamlSubjectConfirmation(true);
+    AlgorithmSuite suite = new AlgorithmSuite();
+    suite.addSignatureMethod(RSA_SHA256);
+    suite.addDigestAlgorithm(SHA256);
+    suite.addC14nAlgorithm(EXCLUSIVE);
+    suite.addTransformAlgorithm(EXCLUSIVE);
+    suite.addTransformAlgorithm(ENVELOPED);
+    suite.setMinimumAsymmetricKeyLength(SHORTEST_KEY);
+    data.setAlgorithmSuite(suite);
+    data.setSamlAlgorithmSuite(suite);
+    return data;
+  }
+
+  private CallbackHandler passwordCallback() {
+    return callbacks -> {
+      for (Callback callback : callbacks) {
+        WSPasswordCallback request = (WSPasswordCallback) callback;
+        request.setPassword(passwords.get(request.getIdentifier()));
+      }
+    };
+  }
+
+  /** The elements that must be signed: no more and no fewer. */
+  private static Set<Element> mustBeSigned(Document document) {
+    Set<Element> wanted = Collections.newSetFromMap(new IdentityHashMap<>());
+    Element envelope = document.getDocumentElement();
+    Element header = Xml.child(envelope, Xml.SOAP, "Header");
+    wanted.add(Xml.child(envelope, Xml.SOAP, "Body"));
+    wanted.add(Xml.child(Xml.child(header, Xml.WSSE, "Security"), Xml.WSU, "Timestamp"));
+    for (Node child = header.getFirstChild(); child != null; child = child.getNextSibling()) {
+      if (child instanceof Element element && Xml.WSA.equals(element.getNamespaceURI())) {
+        wanted.add(element);
+      }
+    }
+    return wanted;
+  }
+
+  private static String checkResults(Document document, WSHandlerResult result, Expected expected) {
+    Map<Integer, List<WSSecurityEngineResult>> actions = result.getActionResults();
+    if (actions.getOrDefault(WSConstants.TS, List.of()).size() != 1) {
+      return "not exactly one timestamp";
+    }
+    if (actions.getOrDefault(WSConstants.UT, List.of()).size() != (expected.hasUsername() ? 1 : 0)) {
+      return "not the expected username token";
+    }
+    List<WSSecurityEngineResult> signatures = actions.getOrDefault(WSConstants.SIGN, List.of());
+    if (signatures.size() != (expected.isSigned() ? 1 : 0)) {
+      return signatures.size() + " message signatures";
+    }
+    for (WSSecurityEngineResult signature : signatures) {
+      Set<Element> wanted = mustBeSigned(document);
+      Set<Element> signed = Collections.newSetFromMap(new IdentityHashMap<>());
+      @SuppressWarnings("unchecked")
+      List<WSDataRef> references = (List<WSDataRef>) signature.get(WSSecurityEngineResult.TAG_DATA_REF_URIS);
+      for (WSDataRef reference : references) {
+        signed.add(reference.getProtectedElement());
+      }
+      if (references.size() != wanted.size() || !signed.equals(wanted)) {
+        return "other elements are signed: " + names(signed) + ", wanted: " + names(wanted);
+      }
+    }
+    return VERIFIES;
+  }
+
+  private static String names(Set<Element> elements) {
+    return elements.stream().map(Node::getNodeName).sorted().collect(Collectors.joining(" "));
+  }
+
+  private static String checkEvents(List<SecurityEvent> events, Document document, Expected expected) {
+    boolean hasUsername = false;
+    int signatures = 0;
+    Set<String> signed = new TreeSet<>();
+    for (SecurityEvent event : events) {
+      hasUsername = hasUsername || event.getSecurityEventType() == WSSecurityEventConstants.USERNAME_TOKEN;
+      signatures += event instanceof SignatureValueSecurityEvent ? 1 : 0;
+      boolean isPart = event instanceof SignedPartSecurityEvent part && part.isSigned();
+      boolean isElement = event instanceof SignedElementSecurityEvent element && element.isSigned();
+      if (isPart || isElement) {
+        signed.add(path(((AbstractElementSecurityEvent) event).getElementPath()));
+      }
+    }
+    if (hasUsername != expected.hasUsername()) {
+      return "not the expected username token";
+    }
+    if (!expected.isSigned()) {
+      return signed.isEmpty() ? VERIFIES : "signed: " + signed;
+    }
+    Set<String> wanted = new TreeSet<>();
+    for (Element element : mustBeSigned(document)) {
+      wanted.add(path(element));
+    }
+    return signatures > 0 && signed.equals(wanted) ? VERIFIES
+      : "other elements are signed: " + signed + ", wanted: " + wanted;
+  }
+
+  private static String path(List<QName> names) {
+    return names.stream().map(QName::getLocalPart).collect(Collectors.joining("/"));
+  }
+
+  private static String path(Element element) {
+    return element.getParentNode() instanceof Element parent ? path(parent) + "/" + element.getLocalName()
+      : element.getLocalName();
+  }
+}

@@ -1,0 +1,51 @@
+// SPDX-License-Identifier: Apache-2.0
+package interop.judge;
+
+import java.util.ArrayList;
+import java.util.List;
+
+/** What the judges found: a table for readers, and the disagreements that make the run fail. */
+final class Verdicts {
+  private final List<String> lines = new ArrayList<>();
+  private int size;
+  private final List<String> disagreements = new ArrayList<>();
+
+  void title(String title, String... columns) {
+    lines.add("");
+    lines.add("**" + title + "**");
+    lines.add("");
+    row((Object[]) columns);
+    lines.add("|" + "---|".repeat(columns.length));
+  }
+
+  void row(Object... cells) {
+    StringBuilder line = new StringBuilder("|");
+    for (Object cell : cells) {
+      line.append(' ').append(String.valueOf(cell).replace("|", "\\|").replace("\n", " ")).append(" |");
+    }
+    lines.add(line.toString());
+  }
+
+  /** The cell for an answer; an answer that differs from the expected one is a disagreement. */
+  String check(String subject, String expected, String found) {
+    ++size;
+    if (expected.equals(found)) {
+      return found;
+    }
+    disagreements.add(subject + ": expected '" + expected + "', found '" + found + "'");
+    return "**" + found + "**, expected " + expected;
+  }
+
+  /** How many answers were checked. */
+  int size() {
+    return size;
+  }
+
+  List<String> disagreements() {
+    return disagreements;
+  }
+
+  String markdown() {
+    return String.join("\n", lines).strip() + "\n";
+  }
+}
