@@ -14,8 +14,6 @@
 
 #include <string_view>
 
-#include <string_view>
-
 namespace SsoClient {
 
 /// The type of `SubjectConfirmationData` with a key.
