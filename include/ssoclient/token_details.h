@@ -64,8 +64,8 @@ struct ConfirmationDetails {
   boost::optional<std::string> inResponseTo;              ///< the identifier of the request that this answers
   boost::optional<std::string> address;                   ///< the network address of the sender
   Tarvel::Ref<const Tarvel::Crypto::Certificate> certificate; ///< of a holder of key; null if only a key is stated
-  /// Of a holder of key: SubjectPublicKeyInfo in DER. Empty for other methods, and if no key can be used: there is none, or
-  /// a key value that is neither RSA with 2048 to 16384 bits nor on the curves P-256, P-384 and P-521.
+  /// Of a holder of key: SubjectPublicKeyInfo in DER. Empty for other methods, and if no key is stated, or only a key value
+  /// that is neither RSA with 2048 to 16384 bits nor on the curves P-256, P-384 and P-521.
   std::vector<std::uint8_t> publicKey;
 };
 

@@ -95,7 +95,7 @@ SubjectPublicKey ParseEcKeyValue(const NodeFilterIterator &keyValue, DeviationSi
   return {};
 }
 
-/// A cursor on the first child of the element at `parent` for which `isWanted` is true; past the end if there is none.
+/// A cursor on the first child of the element at `parent` for which `isWanted` is true; otherwise past the end.
 template <typename IsWanted>
 NodeFilterIterator FindChild(const NodeFilterIterator &parent, const IsWanted &isWanted) {
   NodeFilterIterator child = parent.GetChild();
