@@ -275,7 +275,9 @@ TEST(TakeSaml2Facts, HasNoCertificateForAHolderOfKeyThatStatesAKeyOnlyNorForABea
   Confirmation keyOnly = HolderOfKey();
   keyOnly.details.certificate = nullptr;
   EXPECT_EQ(nullptr, FactsOfAssertion(AssertionWith({keyOnly})).confirmationCertificate);
-  const TokenFacts facts = FactsOfAssertion(AssertionWith({HolderOfKey(), Bearer()}));
+  Confirmation bearer = Bearer();
+  bearer.details.certificate = HolderOfKey().details.certificate;
+  const TokenFacts facts = FactsOfAssertion(AssertionWith({HolderOfKey(), bearer}));
   EXPECT_EQ(SamlToken::BEARER, facts.confirmationMethod);
   EXPECT_EQ(nullptr, facts.confirmationCertificate);
 }
