@@ -85,6 +85,19 @@ TEST_F(ExplainSaml2, DoesNotCallCheckedWhatWasNotChecked) {
       << summary;
 }
 
+TEST_F(ExplainSaml2, SaysForEachOptionAloneWhatIsChecked) {
+  VerifyOptions options = Saml2Options();
+  options.expectedInResponseTo = "_request";
+  const std::string request = Summary(ExplainIn(RichToken(), options), Check::CONFIRMATION);
+  EXPECT_NE(std::string::npos, request.find("; InResponseTo \"_request\"; Address \"192.0.2.7\", not checked."))
+      << request;
+  options = Saml2Options();
+  options.senderAddress = "192.0.2.7";
+  const std::string sender = Summary(ExplainIn(RichToken(), options), Check::CONFIRMATION);
+  EXPECT_NE(std::string::npos, sender.find("; InResponseTo \"_request\", not checked; Address \"192.0.2.7\"."))
+      << sender;
+}
+
 TEST_F(ExplainSaml2, StatesEachReasonOfTheFirstConfirmationIfNoneCanBeUsed) {
   VerifyOptions options = Saml2Options();
   options.requiredConfirmation = SamlToken::BEARER;
@@ -195,6 +208,15 @@ TEST_F(ExplainSaml2, SaysInAStrictReportThatTheOtherProfileReadsTheForm) {
       "accepted form.",
       report.Get(Check::FORM).findings.front().remedy);
   EXPECT_EQ(3u, report.claims.details.value().usedConfirmation);
+}
+
+TEST_F(ExplainSaml2, ClaimsInAStrictReportThatNoConfirmationIsUsedIfNoneCanBe) {
+  const UnverifiedClaims claims =
+      Explain(RichToken(Rich::BEARER + std::string("</saml:Subject>"), "</saml:Subject>")).claims;
+  EXPECT_EQ(2u, claims.details.value().usedConfirmation); // the key's holder
+  const TokenReport report = Explain(TokenFixture("expired"));
+  EXPECT_EQ(1u, report.claims.details.value().confirmations.size());
+  EXPECT_EQ(1u, report.claims.details->usedConfirmation);
 }
 
 TEST_F(ExplainSaml2, SaysNothingAboutADocumentAroundTheAssertion) {
