@@ -194,7 +194,7 @@ TEST_F(DialectService, GetsEachSwitchOfTheCommandLine) {
   EXPECT_THAT(m_service.GetLog(), HasSubstr("unsupported token type 'urn:other'"));
 }
 
-TEST_F(DialectService, IsToldOfItsSwitchesAfterThePreset) {
+TEST_F(DialectService, HasTheSwitchesOfTheCommandLineAfterThoseOfThePreset) {
   // The preset writes wst:OnBehalfOf; the switch makes it wst:DelegateTo again.
   const Result result = Run("ssoclient acquire " + Service() + PASSWORD +
                             "--dialect cxf --dialect-switch delegation=delegate-to --delegate-to bob@corp.example");
