@@ -3,6 +3,7 @@
 /// The JSON of a token's details.
 
 #include "details_view.h"
+#include "json_array.h"
 #include "time_text.h"
 
 #include <tarvel/core/string_util.h>
@@ -32,25 +33,13 @@ Json ToJson(const Tarvel::System::DateTime &time) {
   return UtcText(time);
 }
 
-// Declared here, because the templates find only functions that are declared before them.
+// Declared here, because the template finds only functions that are declared before it.
 Json ToJson(const NameId &nameId);
 Json ToJson(const ProxyDetails &proxy);
-Json ToJson(const AuthnStatementDetails &statement);
-Json ToJson(const AttributeValue &value);
-Json ToJson(const SamlAttribute &attribute);
 
 template <typename Value>
 Json OrNull(const boost::optional<Value> &value) {
   return value ? ToJson(*value) : Json(nullptr);
-}
-
-template <typename Items>
-Json ArrayOf(const Items &items) {
-  Json array = Json::array();
-  for (const auto &item : items) {
-    array.push_back(ToJson(item));
-  }
-  return array;
 }
 
 Json ToJson(const NameId &nameId) {
@@ -92,7 +81,7 @@ Json ToJson(const ProxyDetails &proxy) {
   return {{"count", OrNull(proxy.count)}, {"audiences", proxy.audiences}};
 }
 
-Json ToJson(const AuthnStatementDetails &statement) {
+Json StatementJson(const AuthnStatementDetails &statement) {
   return {{"authnInstant", ToJson(statement.authnInstant)},
           {"sessionIndex", OrNull(statement.sessionIndex)},
           {"sessionNotOnOrAfter", OrNull(statement.sessionNotOnOrAfter)},
@@ -103,15 +92,15 @@ Json ToJson(const AuthnStatementDetails &statement) {
           {"authenticatingAuthorities", statement.authenticatingAuthorities}};
 }
 
-Json ToJson(const AttributeValue &value) {
+Json ValueJson(const AttributeValue &value) {
   return {{"text", value.text}, {"xml", value.isXml}, {"nil", value.isNil}};
 }
 
-Json ToJson(const SamlAttribute &attribute) {
+Json AttributeJson(const SamlAttribute &attribute) {
   return {{"name", attribute.name},
           {"nameFormat", OrNull(attribute.nameFormat)},
           {"friendlyName", OrNull(attribute.friendlyName)},
-          {"values", ArrayOf(attribute.values)}};
+          {"values", JsonArrayOf(attribute.values, ValueJson)}};
 }
 
 /// All keys are in this place, because callers rely on the keys and their order.
@@ -123,8 +112,8 @@ Json DetailsJson(const TokenDetails &details) {
           {"audienceRestrictions", details.audienceRestrictions},
           {"oneTimeUse", details.isOneTimeUse},
           {"proxyRestriction", OrNull(details.proxyRestriction)},
-          {"authnStatements", ArrayOf(details.authnStatements)},
-          {"attributes", ArrayOf(details.attributes)}};
+          {"authnStatements", JsonArrayOf(details.authnStatements, StatementJson)},
+          {"attributes", JsonArrayOf(details.attributes, AttributeJson)}};
 }
 
 } // namespace

@@ -3,7 +3,6 @@
 #include "profile.h"
 
 #include "option.h"
-#include "output.h"
 
 #include <ssoclient/exceptions.h>
 #include <ssoclient/token_verifier.h>
@@ -55,9 +54,8 @@ std::string OtherProfileHint(const std::string &xml, const Tarvel::Crypto::Certi
   if (refusal.empty()) {
     return "--profile saml2 accepts this token";
   }
-  return refusal == RefusalOf(xml, trusted, options)
-             ? std::string()
-             : "--profile saml2 does not accept this token either: " + PrintableValue(refusal);
+  return refusal == RefusalOf(xml, trusted, options) ? std::string()
+                                                     : "--profile saml2 does not accept this token either: " + refusal;
 }
 
 } // namespace SsoClient::Tool

@@ -3,6 +3,7 @@
 /// The JSON of a token.
 
 #include "details_view.h"
+#include "json_array.h"
 #include "time_text.h"
 #include "token_view.h"
 
@@ -65,11 +66,7 @@ Json OrNull(const boost::optional<Value> &value) {
 
 template <typename Items>
 Json ArrayOf(const Items &items) {
-  Json array = Json::array();
-  for (const auto &item : items) {
-    array.push_back(ToJson(item));
-  }
-  return array;
+  return JsonArrayOf(items, [](const auto &item) { return ToJson(item); });
 }
 
 /// These keys and those of `AddDetails` are in one place each, because callers rely on the keys and their order: a change
