@@ -39,17 +39,24 @@ bool Succeeds(const Operation &operation, const std::string &response) {
 
 using TokenHandler = void (ResponseHandlerImpl::*)(Tarvel::Reader *, std::string &) const;
 
-void CheckToken(TokenHandler handle, const std::string &response) {
+/// The token that `handler` finds; empty if it refuses the response.
+std::string TokenOf(const ResponseHandlerImpl &handler, TokenHandler handle, const std::string &response) {
   std::string token = "before";
-  const bool hasToken =
-      Succeeds([&](Tarvel::Reader *reader) { (ResponseHandlerImpl().*handle)(reader, token); }, response);
+  const bool hasToken = Succeeds([&](Tarvel::Reader *reader) { (handler.*handle)(reader, token); }, response);
   Require(hasToken ? token.front() == '<' && token.back() == '>' : token == "before");
+  return hasToken ? token : std::string();
 }
 
-void CheckLeg(const std::string &response) {
+/// A handler that accepts the response anywhere finds each token that the other one finds.
+void CheckToken(const ResponseHandlerImpl &anywhere, TokenHandler handle, const std::string &response) {
+  const std::string token = TokenOf(ResponseHandlerImpl(), handle, response);
+  const std::string tokenAnywhere = TokenOf(anywhere, handle, response);
+  Require(token.empty() || token == tokenAnywhere);
+}
+
+void CheckLeg(const ResponseHandlerImpl &handler, const std::string &response) {
   SsoClient::SPNegoResponse leg{"before", {1, 2, 3}, "before"};
-  const bool hasLeg =
-      Succeeds([&](Tarvel::Reader *reader) { ResponseHandlerImpl().HandleSPNegoResponse(reader, leg); }, response);
+  const bool hasLeg = Succeeds([&](Tarvel::Reader *reader) { handler.HandleSPNegoResponse(reader, leg); }, response);
   if (!hasLeg) {
     Require(leg.contextId == "before" && leg.leg.size() == 3 && leg.tokenXml == "before");
     return;
@@ -61,9 +68,14 @@ void CheckLeg(const std::string &response) {
 
 extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t *data, std::size_t size) {
   const std::string response(reinterpret_cast<const char *>(data), size);
-  CheckToken(&ResponseHandlerImpl::HandleAcquireTokenResponse, response);
-  CheckToken(&ResponseHandlerImpl::HandleRenewTokenResponse, response);
-  Succeeds([](Tarvel::Reader *reader) { ResponseHandlerImpl().HandleValidateSubjectResponse(reader); }, response);
-  CheckLeg(response);
+  SsoClient::ServiceDialect dialect;
+  dialect.acceptsAnyResponse = true;
+  const ResponseHandlerImpl anywhere(dialect);
+  CheckToken(anywhere, &ResponseHandlerImpl::HandleAcquireTokenResponse, response);
+  CheckToken(anywhere, &ResponseHandlerImpl::HandleRenewTokenResponse, response);
+  for (const ResponseHandlerImpl &handler : {ResponseHandlerImpl(), anywhere}) {
+    Succeeds([&](Tarvel::Reader *reader) { handler.HandleValidateSubjectResponse(reader); }, response);
+    CheckLeg(handler, response);
+  }
   return 0;
 }

@@ -52,7 +52,8 @@ struct SSOCLIENT_API ServiceDialect {
   Statement renewing = Statement::ALWAYS;          ///< `wst:Renewing`
   UseKey useKey = UseKey::REFERENCE;               ///< `wst:UseKey`
   Delegation delegation = Delegation::DELEGATE_TO; ///< for `TokenSpec::delegateTo`
-  /// The type of token in a request; empty for "urn:oasis:names:tc:SAML:2.0:assertion".
+  /// The type of token in a request, and in the response that ends a negotiation; empty for
+  /// "urn:oasis:names:tc:SAML:2.0:assertion".
   std::string tokenType;
   /// Whether a reference to a SAML token has the token type of the WS-Security SAML Token Profile 1.1 in its published
   /// spelling, "oasis-wss-saml-token-profile-1.1", which the Basic Security Profile demands.
@@ -71,8 +72,10 @@ SSOCLIENT_API ServiceDialect GetServiceDialect(const std::string &name);
 SSOCLIENT_API std::vector<std::string> GetDialectNames();
 
 /// Checks a dialect. `CreateSecurityTokenService` calls it.
-/// @throws Tarvel::InvalidArgumentException when a text that must be an absolute URI is none, when a fault has no name,
-///         and when two switches contradict each other. The message says which.
+/// @throws Tarvel::InvalidArgumentException when `appliesTo`, a token type or the namespace of a fault is not an absolute
+///         URI, when a fault has no namespace or no local name, when the token type is known not to be SAML 2.0, when a
+///         credential fault is one that services also report for other reasons, and for a value that is not in its
+///         enumeration. The message says which.
 SSOCLIENT_API void CheckServiceDialect(const ServiceDialect &dialect);
 
 } // namespace SsoClient

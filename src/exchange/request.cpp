@@ -16,6 +16,7 @@ const char *const Request::CHALLANGE = WstUris::CHALLENGE_ACTION;
 Request &Request::operator=(Request other) noexcept {
   soapAction.swap(other.soapAction);
   body.swap(other.body);
+  declaresCharset = other.declaresCharset;
   facts.swap(other.facts);
   return *this;
 }

@@ -30,12 +30,6 @@ XMLBuilderPtr SecurityHeaderWith(const XMLBuilderPtr &token) {
   return header;
 }
 
-/// Sets the body of the request. An earlier body is wiped, because it may be secret, too.
-void SetBody(Request &request, std::string body) {
-  request.body.swap(body);
-  Tarvel::SecureWipe(body);
-}
-
 /// A request without `element` would silently ask for less than the spec.
 void ValidateStatement(const char *field, bool value, ServiceDialect::Statement when, const char *element) {
   if (value && when == ServiceDialect::Statement::NEVER) {
@@ -148,6 +142,12 @@ void RequestBuilderImpl::ValidateSpec(const TokenSpec &spec) const {
 
 const Tarvel::Crypto::Certificate *RequestBuilderImpl::GetCertificate() const {
   return m_holderOfKeyConfig ? m_holderOfKeyConfig->certificate.get() : nullptr;
+}
+
+void RequestBuilderImpl::SetBody(Request &request, std::string body) const {
+  request.declaresCharset = m_dialect.declaresCharset;
+  request.body.swap(body);
+  Tarvel::SecureWipe(body);
 }
 
 HeaderBuilders RequestBuilderImpl::GetAddressing(const std::string &action) const {

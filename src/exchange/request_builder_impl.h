@@ -76,6 +76,8 @@ private:
   void ValidateSpec(const TokenSpec &spec) const;
   // The certificate of the identity; null if there is none.
   const Tarvel::Crypto::Certificate *GetCertificate() const;
+  /// Sets the body of the request. An earlier body is wiped, because it may be secret, too.
+  void SetBody(Request &request, std::string body) const;
   // The header elements of WS-Addressing, if the dialect has them.
   HeaderBuilders GetAddressing(const std::string &action) const;
   std::string BuildTokenRequest(TokenSpec::Confirmation confirmation, const XMLBuilderPtr &header,

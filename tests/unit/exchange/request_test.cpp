@@ -46,5 +46,13 @@ TEST(SPNegoResponse, StartsEmpty) {
   EXPECT_EQ(response.tokenXml, "");
 }
 
+TEST(Request, KeepsWhetherItDeclaresItsCharsetWhenItIsAssigned) {
+  Request declaring;
+  declaring.declaresCharset = true;
+  Request assigned;
+  assigned = declaring;
+  EXPECT_TRUE(assigned.declaresCharset);
+}
+
 } // namespace
 } // namespace SsoClient

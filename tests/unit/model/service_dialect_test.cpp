@@ -184,9 +184,11 @@ TEST(CheckServiceDialect, RefusesAFaultThatServicesAlsoReportForOtherReasons) {
       {WSSE, "InvalidSecurity"},   {WST, "RequestFailed"},     {"http://ws.apache.org/wss4j", "SecurityError"},
   };
   for (const auto &[namespaceUri, localName] : general) {
+    std::string shown = "{\"";
+    shown.append(namespaceUri).append("\", \"").append(localName).append("\"}");
     ExpectRefused(WithFault(namespaceUri, localName),
-                  "credentialFaults has a general fault, which would make other failures refused credentials: {\"" +
-                      namespaceUri + "\", \"" + localName + "\"}");
+                  "credentialFaults has a general fault, which would make other failures refused credentials: " +
+                      shown);
     EXPECT_NO_THROW(CheckServiceDialect(WithFault("urn:other", localName))) << localName;
     EXPECT_NO_THROW(CheckServiceDialect(WithFault(namespaceUri, localName + ".Authentication"))) << localName;
   }
