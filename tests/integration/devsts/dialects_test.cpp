@@ -113,6 +113,13 @@ TEST_F(Dialects, AreAnsweredWithTheTokenTypeThatWasAskedForAndWithoutHeaders) {
   EXPECT_EQ("http://docs.oasis-open.org/wss/oasis-wss-saml-token-profile-1.1#SAMLV2.0",
             Between(answer.body, "<wst:TokenType>", "<"));
   EXPECT_THAT(answer.body, Not(HasSubstr("Header")));
+  SsoClient::Request renewal;
+  SsoClient::RequestBuilderImpl(IdentityOf(m_service, "client"), FullDialect(), m_service.GetUrl())
+      .BuildRenewRequest(TokenIn(Post(CertificateBody(FullDialect(), RenewableSpec()))), 3600, renewal);
+  const HttpAnswer renewed = Send(m_service, renewal);
+  ASSERT_TRUE(IsIssued(renewed));
+  EXPECT_EQ("http://docs.oasis-open.org/wss/oasis-wss-saml-token-profile-1.1#SAMLV2.0",
+            Between(renewed.body, "<wst:TokenType>", "<"));
   EXPECT_EQ("urn:oasis:names:tc:SAML:2.0:assertion",
             Between(Post(CertificateBody(ServiceDialect())).body, "<wst:TokenType>", "<"));
 }
@@ -207,6 +214,17 @@ TEST_F(Dialects, WithAddressingAreCoveredBySignaturesThatMayOmitTheHeaders) {
   const std::string plain = CertificateBody(ServiceDialect());
   EXPECT_TRUE(IsIssued(Post(Replaced(
       plain, "</soapenv:Header>", "<To xmlns=\"http://www.w3.org/2005/08/addressing\">urn:x</To></soapenv:Header>"))));
+}
+
+TEST_F(Dialects, WithASignedHeaderOfAddressingAtAnotherPlaceAreRefused) {
+  ServiceDialect dialect;
+  dialect.addressing = true;
+  const std::string body = CertificateBody(dialect);
+  const std::string action = "<wsa:Action " + Between(body, "<wsa:Action ", "</wsa:Action>") + "</wsa:Action>";
+  EXPECT_TRUE(IsRefused(Post(Replaced(Replaced(body, action, ""), "<wst:TokenType>", action + "<wst:TokenType>")),
+                        "wsse:InvalidSecurity",
+                        "the signature must cover the body and the timestamp, and nothing else but headers of "
+                        "WS-Addressing"));
 }
 
 TEST_F(Dialects, WithAnyOtherHeaderAreRefused) {

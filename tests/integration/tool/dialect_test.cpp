@@ -170,6 +170,20 @@ TEST_F(DialectService, IsAskedByEachCommand) {
   EXPECT_EQ("", exchanged.err);
 }
 
+TEST_F(DialectService, IsAskedInItsDialectToRenewAndToValidate) {
+  Acquire("token.xml", std::string(IDENTITY) + "--renewable");
+  const Testing::PostingServer server(
+      {Testing::FaultResponse("wst:RequestFailed", "no"), Testing::FaultResponse("wst:RequestFailed", "no")});
+  const std::string service = "--trust sts.pem --allow-http --sts " + server.GetUrl() + " --addressing ";
+  ExpectResult(Run("ssoclient renew " + service + IDENTITY + "token.xml"), 8, "",
+               "ssoclient: service fault: Unexpected SOAP fault: wst:RequestFailed; request failed.\n");
+  ExpectResult(Run("ssoclient validate " + service + "token.xml"), 8, "",
+               "ssoclient: service fault: Unexpected SOAP fault: wst:RequestFailed; request failed.\n");
+  ASSERT_EQ(2u, server.GetRequests().size());
+  EXPECT_THAT(server.GetRequests()[0], HasSubstr("/RST/Renew</wsa:Action>"));
+  EXPECT_THAT(server.GetRequests()[1], HasSubstr("/RST/Validate</wsa:Action>"));
+}
+
 // The service answers in the type that was asked for, and the library accepts no other: so the switch reached both.
 TEST_F(DialectService, GetsEachSwitchOfTheCommandLine) {
   const std::string type = "--dialect-switch "
@@ -180,7 +194,7 @@ TEST_F(DialectService, GetsEachSwitchOfTheCommandLine) {
   EXPECT_THAT(m_service.GetLog(), HasSubstr("unsupported token type 'urn:other'"));
 }
 
-TEST_F(DialectService, IsToldOfItsSwitchesAfterThePreset) {
+TEST_F(DialectService, HasTheSwitchesOfTheCommandLineAfterThoseOfThePreset) {
   // The preset writes wst:OnBehalfOf; the switch makes it wst:DelegateTo again.
   const Result result = Run("ssoclient acquire " + Service() + PASSWORD +
                             "--dialect cxf --dialect-switch delegation=delegate-to --delegate-to bob@corp.example");
