@@ -53,10 +53,10 @@ public final class Judge {
       }
       tokens.judgeForeign(foreign);
       tokens.judgeMade();
+      verdicts.disagreements().forEach(line -> System.err.println("judge: " + line));
       selfChecks = SelfCheck.run(judge, requests.anySignedRequest(), requests.tokens(), signing);
     }
     Files.writeString(Path.of(arguments[3]), verdicts.markdown());
-    verdicts.disagreements().forEach(line -> System.err.println("judge: " + line));
     System.out.println("judge: " + verdicts.size() + " answers, " + verdicts.disagreements().size()
       + " disagreements; " + selfChecks + " wrong expectations noticed");
     System.exit(verdicts.disagreements().isEmpty() ? 0 : 1);
