@@ -15,7 +15,9 @@ namespace SsoClient {
 
 namespace {
 
+using Tarvel::Xml::AsElement;
 using Tarvel::Xml::ElementNode;
+using Tarvel::Xml::Node;
 using Tarvel::Xml::QName;
 namespace Security = Tarvel::Xml::Security;
 
@@ -30,6 +32,16 @@ ElementNode *RequireChild(ElementNode *parent, std::string_view namespaceUri, co
                                            std::string(parent->GetName()) + "'");
   }
   return child;
+}
+
+/// Adds references to the elements of WS-Addressing in the header, in their order.
+void AddAddressingToSignature(Security::Signature &signature, ElementNode *header) {
+  for (Node *child = header->GetFirstChild(); child; child = child->GetNextSibling()) {
+    ElementNode *const element = AsElement(child);
+    if (element && element->HasQName(Namespaces::WSA, element->GetLocalName())) {
+      AddElementToSignature(signature, element);
+    }
+  }
 }
 
 } // namespace
@@ -48,6 +60,7 @@ void SignSoapMessage(const Tarvel::Crypto::PrivateKey &privateKey, const XMLBuil
   if (timestamp) {
     AddElementToSignature(*signature, timestamp);
   }
+  AddAddressingToSignature(*signature, header);
   if (keyInfo) {
     Tarvel::Ref<ElementNode> content;
     keyInfo->build(content);

@@ -71,15 +71,26 @@ XMLBuilderPtr WsseX509v3BSTReferenceBuilder(const std::string &id) {
   return reference;
 }
 
-XMLBuilderPtr WsseSamlKeyIdReferenceBuilder(const std::string &assertionId) {
-  auto reference = std::make_shared<XMLCompositeBuilder>(
-      ElementBuilder("wsse", "SecurityTokenReference",
-                     {{"wsse11:TokenType", std::string(WireNames::SAML_TOKEN_TYPE)},
-                      {"xmlns:wsse", std::string(Namespaces::WSSE)},
-                      {"xmlns:wsse11", std::string(Namespaces::WSSE11)}}));
+XMLBuilderPtr WsseSamlKeyIdReferenceBuilder(const std::string &assertionId, const ServiceDialect &dialect) {
+  const std::string_view tokenType =
+      dialect.standardTokenTypeReference ? WireNames::SAML_TOKEN_TYPE_AS_PUBLISHED : WireNames::SAML_TOKEN_TYPE;
+  auto reference =
+      std::make_shared<XMLCompositeBuilder>(ElementBuilder("wsse", "SecurityTokenReference",
+                                                           {{"wsse11:TokenType", std::string(tokenType)},
+                                                            {"xmlns:wsse", std::string(Namespaces::WSSE)},
+                                                            {"xmlns:wsse11", std::string(Namespaces::WSSE11)}}));
   reference->Add(
       TextElementBuilder("wsse", "KeyIdentifier", {{"ValueType", std::string(WireNames::SAML_ID)}}, assertionId));
   return reference;
+}
+
+XMLBuilderPtr DsCertificateKeyInfoBuilder(const Tarvel::Crypto::Certificate &certificate) {
+  auto data = std::make_shared<XMLCompositeBuilder>(ElementBuilder("ds", "X509Data"));
+  data->Add(TextElementBuilder("ds", "X509Certificate", EncodeBase64(certificate)));
+  auto keyInfo = std::make_shared<XMLCompositeBuilder>(
+      ElementBuilder("ds", "KeyInfo", {{"xmlns:ds", std::string(Namespaces::DS)}}));
+  keyInfo->Add(data);
+  return keyInfo;
 }
 
 XMLBuilderPtr InsertSamlTokenBuilder(const SamlToken &token) {

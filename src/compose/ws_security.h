@@ -7,6 +7,7 @@
 #include "compose/xml_builder.h"
 
 #include <ssoclient/saml_token.h>
+#include <ssoclient/service_dialect.h>
 #include <tarvel/crypto/certificate.h>
 
 #include <string>
@@ -30,7 +31,10 @@ XMLBuilderPtr WsseX509v3BinarySecTokenBuilder(const std::string &id, const Tarve
 XMLBuilderPtr WsseX509v3BSTReferenceBuilder(const std::string &id);
 
 /// `wsse:SecurityTokenReference` to the SAML assertion with that identifier.
-XMLBuilderPtr WsseSamlKeyIdReferenceBuilder(const std::string &assertionId);
+XMLBuilderPtr WsseSamlKeyIdReferenceBuilder(const std::string &assertionId, const ServiceDialect &dialect = {});
+
+/// `ds:KeyInfo` with the certificate in a `ds:X509Data`.
+XMLBuilderPtr DsCertificateKeyInfoBuilder(const Tarvel::Crypto::Certificate &certificate);
 
 /// The assertion element of the token as it was issued, so that its signature stays valid. It can be built into one tree only.
 /// @throws what `ParseXML` throws when the token's text does not parse.

@@ -8,6 +8,7 @@
 #include "model/namespaces.h"
 #include "xml/date_time_text.h"
 
+#include <tarvel/core/exception.h>
 #include <tarvel/core/string_util.h>
 #include <tarvel/system/date_time.h>
 
@@ -34,18 +35,46 @@ XMLBuilderPtr TokenTargetBuilder(const std::string &name, const SamlToken &token
   return target;
 }
 
+bool IsWritten(ServiceDialect::Statement when, bool value) {
+  return when == ServiceDialect::Statement::ALWAYS || (when == ServiceDialect::Statement::WHEN_TRUE && value);
+}
+
+/// The element in which the dialect names the party to which the token is delegated, without that party.
+XMLBuilderPtr DelegationElementBuilder(ServiceDialect::Delegation delegation) {
+  switch (delegation) {
+  case ServiceDialect::Delegation::ON_BEHALF_OF:
+    return ElementBuilder("wst", "OnBehalfOf");
+  case ServiceDialect::Delegation::ACT_AS:
+    return ElementBuilder("wst14", "ActAs", {{"xmlns:wst14", std::string(Namespaces::WST14)}});
+  case ServiceDialect::Delegation::DELEGATE_TO:
+    break;
+  }
+  return ElementBuilder("wst", "DelegateTo");
+}
+
 } // namespace
 
-XMLCompositePtr CommonAcquireSecurityTokenBuilder(SamlToken::ConfirmationType confirmation, const TokenSpec &spec) {
+std::string RequestedTokenType(const ServiceDialect &dialect) {
+  return dialect.tokenType.empty() ? std::string(Namespaces::SAML) : dialect.tokenType;
+}
+
+XMLCompositePtr CommonAcquireSecurityTokenBuilder(SamlToken::ConfirmationType confirmation, const TokenSpec &spec,
+                                                  const ServiceDialect &dialect) {
   const std::string keyType =
       confirmation == SamlToken::BEARER ? WstUris::KEY_TYPE_BEARER : WstUris::KEY_TYPE_PUBLIC_KEY;
-  XMLCompositePtr request = RequestSecurityTokenBuilder(std::string(Namespaces::SAML), WstUris::ISSUE);
-  request->Add(TextElementBuilder("wst", "KeyType", keyType))
-      .Add(WssuLifetimeBuilder(spec.tokenLifetimeSec))
-      .Add(WstRenewingBuilder(spec.renewable))
-      .Add(TextElementBuilder("wst", "Delegatable", BooleanText(spec.delegable)));
+  XMLCompositePtr request = RequestSecurityTokenBuilder(RequestedTokenType(dialect), WstUris::ISSUE);
+  if (dialect.appliesTo) {
+    request->Add(WspAppliesToBuilder(*dialect.appliesTo));
+  }
+  request->Add(TextElementBuilder("wst", "KeyType", keyType)).Add(WssuLifetimeBuilder(spec.tokenLifetimeSec));
+  if (IsWritten(dialect.renewing, spec.renewable)) {
+    request->Add(WstRenewingBuilder(spec.renewable));
+  }
+  if (IsWritten(dialect.delegatable, spec.delegable)) {
+    request->Add(TextElementBuilder("wst", "Delegatable", BooleanText(spec.delegable)));
+  }
   if (spec.delegateTo) {
-    request->Add(WstDelegateToBuilder(*spec.delegateTo));
+    request->Add(WstDelegateToBuilder(*spec.delegateTo, dialect));
   }
   if (!spec.audienceRestriction.empty()) {
     request->Add(WstParticipantsBuilders(spec.audienceRestriction));
@@ -56,20 +85,32 @@ XMLCompositePtr CommonAcquireSecurityTokenBuilder(SamlToken::ConfirmationType co
   return request;
 }
 
-XMLCompositePtr AcquireSecurityTokenBuilder(SamlToken::ConfirmationType confirmation, const TokenSpec &spec) {
-  XMLCompositePtr request = CommonAcquireSecurityTokenBuilder(confirmation, spec);
-  if (confirmation == SamlToken::HOLDER_OF_KEY) {
+XMLCompositePtr AcquireSecurityTokenBuilder(SamlToken::ConfirmationType confirmation, const TokenSpec &spec,
+                                            const ServiceDialect &dialect,
+                                            const Tarvel::Crypto::Certificate *certificate) {
+  XMLCompositePtr request = ExchangeSecurityTokenBuilder(confirmation, spec, dialect, certificate);
+  if (confirmation == SamlToken::HOLDER_OF_KEY && dialect.useKey == ServiceDialect::UseKey::REFERENCE) {
     request->Add(ElementBuilder("wst", "UseKey", {{"Sig", std::string(WireNames::HOLDER_OF_KEY_SIGNATURE_ID)}}));
   }
   return request;
 }
 
-XMLCompositePtr ExchangeSecurityTokenBuilder(SamlToken::ConfirmationType confirmation, const TokenSpec &spec) {
-  return CommonAcquireSecurityTokenBuilder(confirmation, spec);
+XMLCompositePtr ExchangeSecurityTokenBuilder(SamlToken::ConfirmationType confirmation, const TokenSpec &spec,
+                                             const ServiceDialect &dialect,
+                                             const Tarvel::Crypto::Certificate *certificate) {
+  XMLCompositePtr request = CommonAcquireSecurityTokenBuilder(confirmation, spec, dialect);
+  if (confirmation == SamlToken::HOLDER_OF_KEY && dialect.useKey == ServiceDialect::UseKey::CERTIFICATE) {
+    if (!certificate) {
+      throw Tarvel::InvalidArgumentException("wst:UseKey needs a certificate");
+    }
+    request->Add(WstUseKeyBuilder(*certificate));
+  }
+  return request;
 }
 
-XMLBuilderPtr RenewSecurityTokenBuilder(const SamlToken &token, std::int64_t lifetimeSec) {
-  XMLCompositePtr request = RequestSecurityTokenBuilder(std::string(Namespaces::SAML), WstUris::RENEW);
+XMLBuilderPtr RenewSecurityTokenBuilder(const SamlToken &token, std::int64_t lifetimeSec,
+                                        const ServiceDialect &dialect) {
+  XMLCompositePtr request = RequestSecurityTokenBuilder(RequestedTokenType(dialect), WstUris::RENEW);
   request->Add(WssuLifetimeBuilder(lifetimeSec)).Add(TokenTargetBuilder("RenewTarget", token));
   return request;
 }
@@ -94,10 +135,23 @@ XMLBuilderPtr WstRenewingBuilder(bool allow) {
   return ElementBuilder("wst", "Renewing", {{"Allow", BooleanText(allow)}, {"OK", BooleanText(false)}});
 }
 
-XMLBuilderPtr WstDelegateToBuilder(const std::string &name) {
-  auto delegateTo = std::make_shared<XMLCompositeBuilder>(ElementBuilder("wst", "DelegateTo"));
+XMLBuilderPtr WstDelegateToBuilder(const std::string &name, const ServiceDialect &dialect) {
+  auto delegateTo = std::make_shared<XMLCompositeBuilder>(DelegationElementBuilder(dialect.delegation));
   delegateTo->Add(WsseUsernameTokenBuilder(name));
   return delegateTo;
+}
+
+XMLBuilderPtr WstUseKeyBuilder(const Tarvel::Crypto::Certificate &certificate) {
+  auto useKey = std::make_shared<XMLCompositeBuilder>(ElementBuilder("wst", "UseKey"));
+  useKey->Add(DsCertificateKeyInfoBuilder(certificate));
+  return useKey;
+}
+
+XMLBuilderPtr WspAppliesToBuilder(const std::string &address) {
+  auto appliesTo = std::make_shared<XMLCompositeBuilder>(ElementBuilder(
+      "wsp", "AppliesTo", {{"xmlns:wsa", std::string(Namespaces::WSA)}, {"xmlns:wsp", std::string(Namespaces::WSP)}}));
+  appliesTo->Add(WsaEndpointAddressReferenceBuilder(address));
+  return appliesTo;
 }
 
 XMLBuilderPtr WstParticipantsBuilders(const std::set<std::string> &audience) {

@@ -7,7 +7,9 @@
 #include "compose/xml_builder.h"
 
 #include <ssoclient/saml_token.h>
+#include <ssoclient/service_dialect.h>
 #include <ssoclient/token_spec.h>
+#include <tarvel/crypto/certificate.h>
 
 #include <cstdint>
 #include <set>
@@ -16,18 +18,32 @@
 
 namespace SsoClient {
 
+/// The type of token that requests ask for.
+std::string RequestedTokenType(const ServiceDialect &dialect);
+
 /// The elements that all issue requests have in common. Further children may be added.
-XMLCompositePtr CommonAcquireSecurityTokenBuilder(SamlToken::ConfirmationType confirmation, const TokenSpec &spec);
+XMLCompositePtr CommonAcquireSecurityTokenBuilder(SamlToken::ConfirmationType confirmation, const TokenSpec &spec,
+                                                  const ServiceDialect &dialect = {});
 
-/// An issue request. For a holder-of-key token its last element is `wst:UseKey`, which refers to the message signature.
-XMLCompositePtr AcquireSecurityTokenBuilder(SamlToken::ConfirmationType confirmation, const TokenSpec &spec);
+/// An issue request. For a holder-of-key token its last element is `wst:UseKey`, which refers to the message signature
+/// unless the dialect demands something else.
+/// @param certificate for a `wst:UseKey` with the certificate
+/// @throws Tarvel::InvalidArgumentException when the certificate is needed and null.
+XMLCompositePtr AcquireSecurityTokenBuilder(SamlToken::ConfirmationType confirmation, const TokenSpec &spec,
+                                            const ServiceDialect &dialect = {},
+                                            const Tarvel::Crypto::Certificate *certificate = nullptr);
 
-/// An issue request that presents a token. It never has a `wst:UseKey`, on purpose.
-XMLCompositePtr ExchangeSecurityTokenBuilder(SamlToken::ConfirmationType confirmation, const TokenSpec &spec);
+/// An issue request that presents a token. It has a `wst:UseKey` only if the dialect demands one with the certificate.
+/// @param certificate for that
+/// @throws Tarvel::InvalidArgumentException when the certificate is needed and null.
+XMLCompositePtr ExchangeSecurityTokenBuilder(SamlToken::ConfirmationType confirmation, const TokenSpec &spec,
+                                             const ServiceDialect &dialect = {},
+                                             const Tarvel::Crypto::Certificate *certificate = nullptr);
 
 /// A request to renew `token` for `lifetimeSec` seconds from now. It can be built into one tree only.
 /// @throws what `ParseXML` throws when the token's text does not parse.
-XMLBuilderPtr RenewSecurityTokenBuilder(const SamlToken &token, std::int64_t lifetimeSec);
+XMLBuilderPtr RenewSecurityTokenBuilder(const SamlToken &token, std::int64_t lifetimeSec,
+                                        const ServiceDialect &dialect = {});
 
 /// A request to validate `token`. It can be built into one tree only.
 /// @throws what `ParseXML` throws when the token's text does not parse.
@@ -39,8 +55,14 @@ XMLBuilderPtr WssuLifetimeBuilder(std::int64_t seconds);
 /// `wst:Renewing`. Renewal after expiry is never requested.
 XMLBuilderPtr WstRenewingBuilder(bool allow);
 
-/// `wst:DelegateTo` with the principal as a username token without password.
-XMLBuilderPtr WstDelegateToBuilder(const std::string &name);
+/// `wst:DelegateTo`, or the element that the dialect has for it, with the principal as a username token without password.
+XMLBuilderPtr WstDelegateToBuilder(const std::string &name, const ServiceDialect &dialect = {});
+
+/// `wst:UseKey` with the certificate.
+XMLBuilderPtr WstUseKeyBuilder(const Tarvel::Crypto::Certificate &certificate);
+
+/// `wsp:AppliesTo` with the address of the service for which the token is.
+XMLBuilderPtr WspAppliesToBuilder(const std::string &address);
 
 /// `wst:Participants`, one `wst:Participant` for each audience entry.
 XMLBuilderPtr WstParticipantsBuilders(const std::set<std::string> &audience);

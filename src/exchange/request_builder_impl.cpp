@@ -2,7 +2,7 @@
 
 #include "exchange/request_builder_impl.h"
 
-#include "compose/soap_envelope.h"
+#include "compose/ws_addressing.h"
 #include "compose/ws_security.h"
 #include "compose/ws_trust.h"
 #include "exchange/spnego_body.h"
@@ -36,10 +36,22 @@ void SetBody(Request &request, std::string body) {
   Tarvel::SecureWipe(body);
 }
 
+/// A request without `element` would silently ask for less than the spec.
+void ValidateStatement(const char *field, bool value, ServiceDialect::Statement when, const char *element) {
+  if (value && when == ServiceDialect::Statement::NEVER) {
+    throw Tarvel::InvalidArgumentException(std::string(field) + " is true, but the dialect of the service has no " +
+                                           element);
+  }
+}
+
 } // namespace
 
 RequestBuilderImpl::RequestBuilderImpl(const boost::optional<HolderOfKeyConfig> &holderOfKeyConfig)
-    : m_holderOfKeyConfig(holderOfKeyConfig) {
+    : RequestBuilderImpl(holderOfKeyConfig, ServiceDialect(), std::string()) {}
+
+RequestBuilderImpl::RequestBuilderImpl(const boost::optional<HolderOfKeyConfig> &holderOfKeyConfig,
+                                       const ServiceDialect &dialect, const std::string &serviceAddress)
+    : m_holderOfKeyConfig(holderOfKeyConfig), m_dialect(dialect), m_serviceAddress(serviceAddress) {
   if (m_holderOfKeyConfig && !(m_holderOfKeyConfig->privateKey && m_holderOfKeyConfig->certificate)) {
     throw Tarvel::InvalidArgumentException("HolderOfKeyConfig lacks its private key or its certificate");
   }
@@ -47,22 +59,23 @@ RequestBuilderImpl::RequestBuilderImpl(const boost::optional<HolderOfKeyConfig> 
 
 void RequestBuilderImpl::BuildUserPassTokenRequest(const std::string &username, const std::string &password,
                                                    const TokenSpec &spec, Request &request) const {
-  ValidateLifetime(spec.tokenLifetimeSec);
+  ValidateSpec(spec);
   const XMLBuilderPtr header = SecurityHeaderWith(WsseUsernameTokenBuilder(username, password));
-  const XMLBuilderPtr body = AcquireSecurityTokenBuilder(GetEffectiveConfirmationType(spec.confirmation), spec);
+  const XMLBuilderPtr body =
+      AcquireSecurityTokenBuilder(GetEffectiveConfirmationType(spec.confirmation), spec, m_dialect, GetCertificate());
   request.soapAction = Request::ISSUE;
   // On purpose, a delegate overrides the confirmation for the signature, but not for the body.
-  SetBody(request, BuildTokenRequest(ConfOverrideWithDelegate(spec), header, body));
+  SetBody(request, BuildTokenRequest(ConfOverrideWithDelegate(spec), header, body, request.soapAction));
 }
 
 void RequestBuilderImpl::BuildInitialSPNegoRequest(const TokenSpec &spec, const std::vector<std::uint8_t> &leg,
                                                    Request &request) const {
-  ValidateLifetime(spec.tokenLifetimeSec);
+  ValidateSpec(spec);
   const XMLBuilderPtr header = SecurityHeader();
-  const XMLBuilderPtr body =
-      std::make_shared<const XMLBodyBuilderInitialSPNego>(GetEffectiveConfirmationType(spec.confirmation), spec, leg);
+  const XMLBuilderPtr body = std::make_shared<const XMLBodyBuilderInitialSPNego>(
+      GetEffectiveConfirmationType(spec.confirmation), spec, leg, m_dialect, GetCertificate());
   request.soapAction = Request::ISSUE;
-  SetBody(request, BuildTokenRequest(ConfOverrideWithDelegate(spec), header, body));
+  SetBody(request, BuildTokenRequest(ConfOverrideWithDelegate(spec), header, body, request.soapAction));
 }
 
 void RequestBuilderImpl::BuildContinuedSPNegoRequest(const std::string &contextId, const std::vector<std::uint8_t> &leg,
@@ -70,37 +83,39 @@ void RequestBuilderImpl::BuildContinuedSPNegoRequest(const std::string &contextI
   const XMLBuilderPtr header = SecurityHeader();
   const XMLBuilderPtr body = std::make_shared<const XMLBodyBuilderContinuedSPNego>(contextId, leg);
   request.soapAction = Request::CHALLANGE;
-  SetBody(request, BuildUnSignedRequest(header, body));
+  SetBody(request, BuildUnSignedRequest(header, body, request.soapAction));
 }
 
 void RequestBuilderImpl::BuildCertificateTokenRequest(const TokenSpec &spec, Request &request) const {
-  ValidateLifetime(spec.tokenLifetimeSec);
+  ValidateSpec(spec);
   ValidateHokIsConfigured(ACQUIRE_BY_CERTIFICATE);
   if (spec.confirmation != TokenSpec::CONFIRMATION_DEFAULT) {
     throw Tarvel::InvalidArgumentException(std::string("TokenSpec::confirmation must be CONFIRMATION_DEFAULT for ") +
                                            ACQUIRE_BY_CERTIFICATE);
   }
   const XMLBuilderPtr header = SecurityHeader();
-  const XMLBuilderPtr body = AcquireSecurityTokenBuilder(GetEffectiveConfirmationType(spec.confirmation), spec);
+  const XMLBuilderPtr body =
+      AcquireSecurityTokenBuilder(GetEffectiveConfirmationType(spec.confirmation), spec, m_dialect, GetCertificate());
   request.soapAction = Request::ISSUE;
-  SetBody(request, BuildCertRefSignedRequest(header, body));
+  SetBody(request, BuildCertRefSignedRequest(header, body, request.soapAction));
 }
 
 void RequestBuilderImpl::BuildExchangeTokenRequest(const SamlToken &token, const TokenSpec &spec,
                                                    Request &request) const {
-  ValidateLifetime(spec.tokenLifetimeSec);
+  ValidateSpec(spec);
   ValidateHokIsConfigured(ACQUIRE_BY_TOKEN);
   const XMLBuilderPtr header = SecurityHeaderWith(InsertSamlTokenBuilder(token));
-  const XMLBuilderPtr body = ExchangeSecurityTokenBuilder(GetEffectiveConfirmationType(spec.confirmation), spec);
+  const XMLBuilderPtr body =
+      ExchangeSecurityTokenBuilder(GetEffectiveConfirmationType(spec.confirmation), spec, m_dialect, GetCertificate());
   request.soapAction = Request::ISSUE;
-  SetBody(request, BuildSamlRefSignedRequest(token.GetId(), header, body));
+  SetBody(request, BuildSamlRefSignedRequest(token.GetId(), header, body, request.soapAction));
 }
 
 void RequestBuilderImpl::BuildValidateSubjectRequest(const SamlToken &token, Request &request) const {
   request.soapAction = Request::VALIDATE;
   const XMLBuilderPtr body = ValidateSecurityTokenBuilder(token);
   const XMLBuilderPtr header = SecurityHeader();
-  SetBody(request, BuildUnSignedRequest(header, body));
+  SetBody(request, BuildUnSignedRequest(header, body, request.soapAction));
 }
 
 void RequestBuilderImpl::BuildRenewRequest(const SamlToken &token, std::int64_t lifetimeSec, Request &request) const {
@@ -108,9 +123,9 @@ void RequestBuilderImpl::BuildRenewRequest(const SamlToken &token, std::int64_t 
   ValidateHokIsConfigured(RENEW_TOKEN);
   ValidateTokenIsHok(token, RENEW_TOKEN);
   const XMLBuilderPtr header = SecurityHeader();
-  const XMLBuilderPtr body = RenewSecurityTokenBuilder(token, lifetimeSec);
+  const XMLBuilderPtr body = RenewSecurityTokenBuilder(token, lifetimeSec, m_dialect);
   request.soapAction = Request::RENEW;
-  SetBody(request, BuildCertRefSignedRequest(header, body));
+  SetBody(request, BuildCertRefSignedRequest(header, body, request.soapAction));
 }
 
 void RequestBuilderImpl::ValidateHokIsConfigured(const std::string &actionName) const {
@@ -125,27 +140,43 @@ RequestBuilderImpl::GetEffectiveConfirmationType(TokenSpec::Confirmation confirm
   return holderOfKey ? SamlToken::HOLDER_OF_KEY : SamlToken::BEARER;
 }
 
+void RequestBuilderImpl::ValidateSpec(const TokenSpec &spec) const {
+  ValidateLifetime(spec.tokenLifetimeSec);
+  ValidateStatement("TokenSpec::delegable", spec.delegable, m_dialect.delegatable, "wst:Delegatable");
+  ValidateStatement("TokenSpec::renewable", spec.renewable, m_dialect.renewing, "wst:Renewing");
+}
+
+const Tarvel::Crypto::Certificate *RequestBuilderImpl::GetCertificate() const {
+  return m_holderOfKeyConfig ? m_holderOfKeyConfig->certificate.get() : nullptr;
+}
+
+HeaderBuilders RequestBuilderImpl::GetAddressing(const std::string &action) const {
+  return m_dialect.addressing ? WsAddressingHeaderBuilders(m_serviceAddress, action) : HeaderBuilders();
+}
+
 std::string RequestBuilderImpl::BuildTokenRequest(TokenSpec::Confirmation confirmation, const XMLBuilderPtr &header,
-                                                  const XMLBuilderPtr &body) const {
+                                                  const XMLBuilderPtr &body, const std::string &action) const {
   if (GetEffectiveConfirmationType(confirmation) == SamlToken::HOLDER_OF_KEY) {
-    return BuildCertRefSignedRequest(header, body);
+    return BuildCertRefSignedRequest(header, body, action);
   }
-  return BuildUnSignedRequest(header, body);
+  return BuildUnSignedRequest(header, body, action);
 }
 
-std::string RequestBuilderImpl::BuildUnSignedRequest(const XMLBuilderPtr &header, const XMLBuilderPtr &body) const {
-  return SerializeToXML(SoapBuilder(header, body));
+std::string RequestBuilderImpl::BuildUnSignedRequest(const XMLBuilderPtr &header, const XMLBuilderPtr &body,
+                                                     const std::string &action) const {
+  return SerializeToXML(SoapBuilder(header, body, GetAddressing(action)));
 }
 
-std::string RequestBuilderImpl::BuildCertRefSignedRequest(const XMLBuilderPtr &header,
-                                                          const XMLBuilderPtr &body) const {
+std::string RequestBuilderImpl::BuildCertRefSignedRequest(const XMLBuilderPtr &header, const XMLBuilderPtr &body,
+                                                          const std::string &action) const {
   return SerializeToXML(CertRefSignedSoapBuilder(header, body, m_holderOfKeyConfig->privateKey.get(),
-                                                 m_holderOfKeyConfig->certificate.get()));
+                                                 m_holderOfKeyConfig->certificate.get(), GetAddressing(action)));
 }
 
 std::string RequestBuilderImpl::BuildSamlRefSignedRequest(const std::string &tokenId, const XMLBuilderPtr &header,
-                                                          const XMLBuilderPtr &body) const {
-  return SerializeToXML(SamlRefSignedSoapBuilder(header, body, m_holderOfKeyConfig->privateKey.get(), tokenId));
+                                                          const XMLBuilderPtr &body, const std::string &action) const {
+  return SerializeToXML(SamlRefSignedSoapBuilder(header, body, m_holderOfKeyConfig->privateKey.get(), tokenId,
+                                                 m_dialect, GetAddressing(action)));
 }
 
 void ValidateLifetime(std::int64_t lifetimeSec) {

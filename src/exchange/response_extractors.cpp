@@ -2,6 +2,7 @@
 
 #include "exchange/response_extractors.h"
 
+#include "compose/ws_trust.h"
 #include "exchange/soap_response.h"
 #include "model/namespaces.h"
 #include "xml/xml_text.h"
@@ -56,29 +57,47 @@ std::vector<std::uint8_t> DecodeLeg(const std::string &text) {
   }
 }
 
-void RequireSamlTokenType(const ElementNode &response) {
+void RequireTokenType(const ElementNode &response, const ServiceDialect &dialect) {
   const std::string type = TextOfChild(response, "TokenType");
-  if (type != Namespaces::SAML) {
+  const std::string requested = RequestedTokenType(dialect);
+  if (type != requested) {
     // The parenthesis stays open: this is the established form of the message.
-    throw SsoException("Invalid token type: " + type + " (expected: " + std::string(Namespaces::SAML));
+    throw SsoException("Invalid token type: " + type + " (expected: " + requested);
   }
+}
+
+const ElementNode *FindInBody(const ElementNode &body) {
+  return body.FindChildElement("RequestSecurityTokenResponse");
+}
+
+const ElementNode *FindInCollection(const ElementNode &body) {
+  return FindDescendant(&body, {"RequestSecurityTokenResponseCollection", "RequestSecurityTokenResponse"});
+}
+
+/// The response if it is where it is expected, which any place is if the dialect says so. Otherwise null.
+const ElementNode *Choose(const ElementNode *expected, const ElementNode *other, const ServiceDialect &dialect) {
+  return expected || !dialect.acceptsAnyResponse ? expected : other;
+}
+
+const ElementNode *FindAssertion(const ElementNode *response) {
+  return FindDescendant(response, {"RequestedSecurityToken", "Assertion"});
 }
 
 } // namespace
 
-std::string ExtractIssuedToken(const ElementNode &body) {
-  return CanonicalElementText(
-      RequireElement(FindDescendant(&body, {"RequestSecurityTokenResponseCollection", "RequestSecurityTokenResponse",
-                                            "RequestedSecurityToken", "Assertion"})));
+std::string ExtractIssuedToken(const ElementNode &body, const ServiceDialect &dialect) {
+  const ElementNode *const response = Choose(FindInCollection(body), FindInBody(body), dialect);
+  return CanonicalElementText(RequireElement(FindAssertion(response)));
 }
 
-std::string ExtractRenewedToken(const ElementNode &body) {
-  return CanonicalElementText(
-      RequireElement(FindDescendant(&body, {"RequestSecurityTokenResponse", "RequestedSecurityToken", "Assertion"})));
+std::string ExtractRenewedToken(const ElementNode &body, const ServiceDialect &dialect) {
+  const ElementNode *const response = Choose(FindInBody(body), FindInCollection(body), dialect);
+  return CanonicalElementText(RequireElement(FindAssertion(response)));
 }
 
-bool ExtractValidationStatus(const ElementNode &body) {
-  const TextNode *const code = GetTextNode(FindDescendant(&body, {"RequestSecurityTokenResponse", "Status", "Code"}));
+bool ExtractValidationStatus(const ElementNode &body, const ServiceDialect &dialect) {
+  const ElementNode *const response = Choose(FindInBody(body), FindInCollection(body), dialect);
+  const TextNode *const code = GetTextNode(FindDescendant(response, {"Status", "Code"}));
   if (!code) {
     ThrowUnexpectedFormat();
   }
@@ -91,11 +110,11 @@ bool ExtractValidationStatus(const ElementNode &body) {
   ThrowUnexpectedFormat();
 }
 
-SPNegoResponse ExtractSPNegoLeg(const ElementNode &body) {
-  const ElementNode *const intermediate = body.FindChildElement("RequestSecurityTokenResponse");
-  const ElementNode &response = RequireElement(
-      intermediate ? intermediate
-                   : FindDescendant(&body, {"RequestSecurityTokenResponseCollection", "RequestSecurityTokenResponse"}));
+SPNegoResponse ExtractSPNegoLeg(const ElementNode &body, const ServiceDialect &dialect) {
+  const ElementNode *const inBody = FindInBody(body);
+  const ElementNode &response = RequireElement(inBody ? inBody : FindInCollection(body));
+  const ElementNode *const assertion = FindAssertion(&response);
+  const bool isIntermediate = dialect.acceptsAnyResponse ? !assertion : inBody != nullptr;
 
   SPNegoResponse result;
   result.contextId = ReadContext(response);
@@ -103,15 +122,15 @@ SPNegoResponse ExtractSPNegoLeg(const ElementNode &body) {
   if (!exchange.empty()) {
     result.leg = DecodeLeg(exchange);
   }
-  if (intermediate) {
+  if (isIntermediate) {
     if (exchange.empty()) {
       ThrowUnexpectedFormat();
     }
     return result;
   }
-  const ElementNode &assertion = RequireElement(FindDescendant(&response, {"RequestedSecurityToken", "Assertion"}));
-  RequireSamlTokenType(response);
-  result.tokenXml = CanonicalElementText(assertion);
+  RequireElement(assertion);
+  RequireTokenType(response, dialect);
+  result.tokenXml = CanonicalElementText(*assertion);
   return result;
 }
 

@@ -11,46 +11,42 @@
 
 namespace SsoClient {
 
-namespace {
-
 using Tarvel::Xml::ElementNode;
 
 /// The result of `extractor` for the body of a response that is not a fault. The name of the root element is ignored.
 template <typename Extractor>
-auto ProcessResponseWith(Tarvel::Reader &response, const Extractor &extractor, FaultListener *listener) {
+auto ResponseHandlerImpl::Process(Tarvel::Reader &response, const Extractor &extractor) const {
   const Tarvel::Ref<const ElementNode> envelope = ParseResponseDocument(response);
-  CheckSoapFault(*envelope, listener);
+  CheckSoapFault(*envelope, m_listener, m_dialect);
   const ElementNode *const body = envelope->FindChildElement("Body");
   if (!body) {
     // "SAOP" is the established spelling of the message.
     throw SsoException("Unexpected response format: missing SAOP Body.");
   }
-  return extractor(*body);
+  return extractor(*body, m_dialect);
 }
 
-} // namespace
-
 void ResponseHandlerImpl::HandleAcquireTokenResponse(Tarvel::Reader *response, std::string &tokenXml) const {
-  tokenXml = ProcessResponseWith(*response, ExtractIssuedToken, m_listener);
+  tokenXml = Process(*response, ExtractIssuedToken);
 }
 
 bool ResponseHandlerImpl::HandleValidateSubjectResponse(Tarvel::Reader *response) const {
-  return ProcessResponseWith(*response, ExtractValidationStatus, m_listener);
+  return Process(*response, ExtractValidationStatus);
 }
 
 void ResponseHandlerImpl::HandleRenewTokenResponse(Tarvel::Reader *response, std::string &tokenXml) const {
-  tokenXml = ProcessResponseWith(*response, ExtractRenewedToken, m_listener);
+  tokenXml = Process(*response, ExtractRenewedToken);
 }
 
 void ResponseHandlerImpl::HandleSPNegoResponse(Tarvel::Reader *response, SPNegoResponse &spnego) const {
-  SPNegoResponse leg = ProcessResponseWith(*response, ExtractSPNegoLeg, m_listener);
+  SPNegoResponse leg = Process(*response, ExtractSPNegoLeg);
   spnego.contextId.swap(leg.contextId);
   spnego.leg.swap(leg.leg);
   spnego.tokenXml.swap(leg.tokenXml);
 }
 
 std::shared_ptr<const ResponseHandler> ResponseHandlerImpl::WithFaultListener(FaultListener &listener) const {
-  return std::make_shared<const ResponseHandlerImpl>(&listener);
+  return std::make_shared<const ResponseHandlerImpl>(m_dialect, &listener);
 }
 
 } // namespace SsoClient

@@ -6,10 +6,12 @@
 
 #include "exchange/response_handler.h"
 
+#include <ssoclient/service_dialect.h>
+
 namespace SsoClient {
 
 /// Parses the body, turns a SOAP fault into an exception, and extracts the result of the operation. It has no state
-/// except the listener, so any number of threads may use one handler without a listener. A call that throws does not
+/// except the dialect and the listener, so any number of threads may use one handler without a listener. A call that throws does not
 /// change its out argument.
 ///
 /// All functions throw
@@ -22,6 +24,10 @@ public:
   /// @param listener receives each fault; null for none. It must outlive the handler.
   explicit ResponseHandlerImpl(FaultListener *listener = nullptr) noexcept : m_listener(listener) {}
 
+  /// @param dialect how the service answers; copied
+  explicit ResponseHandlerImpl(const ServiceDialect &dialect, FaultListener *listener = nullptr)
+      : m_dialect(dialect), m_listener(listener) {}
+
   void HandleAcquireTokenResponse(Tarvel::Reader *response, std::string &tokenXml) const override;
   bool HandleValidateSubjectResponse(Tarvel::Reader *response) const override;
   void HandleRenewTokenResponse(Tarvel::Reader *response, std::string &tokenXml) const override;
@@ -29,6 +35,10 @@ public:
   std::shared_ptr<const ResponseHandler> WithFaultListener(FaultListener &listener) const override;
 
 private:
+  template <typename Extractor>
+  auto Process(Tarvel::Reader &response, const Extractor &extractor) const;
+
+  ServiceDialect m_dialect;
   FaultListener *m_listener;
 };
 

@@ -24,21 +24,22 @@ using Tarvel::Xml::ElementNode;
 using Tarvel::Xml::QName;
 using Tarvel::Xml::TextNode;
 
-struct FaultName {
+struct AuthenticationFault {
   std::string_view namespaceUri;
   std::string_view localName;
 };
 
-/// The fault codes with which services refuse the caller's credentials.
-constexpr FaultName AUTHENTICATION_FAULTS[] = {
+/// The fault codes with which every service may refuse the caller's credentials.
+constexpr AuthenticationFault AUTHENTICATION_FAULTS[] = {
     {Namespaces::WST, "FailedAuthentication"},
     {Namespaces::WST, "InvalidSecurityToken"},
     {Namespaces::WSSE, "InvalidSecurityToken"},
 };
 
-bool IsAuthenticationFailure(const QName &faultCode) {
-  return std::any_of(std::begin(AUTHENTICATION_FAULTS), std::end(AUTHENTICATION_FAULTS), [&](const FaultName &name) {
-    return faultCode.namespaceUri == name.namespaceUri && faultCode.localName == name.localName;
+template <typename Faults>
+bool Contains(const Faults &faults, const QName &faultCode) {
+  return std::any_of(std::begin(faults), std::end(faults), [&](const auto &fault) {
+    return faultCode.namespaceUri == fault.namespaceUri && faultCode.localName == fault.localName;
   });
 }
 
@@ -68,7 +69,7 @@ Ref<const ElementNode> ParseResponseDocument(Tarvel::Reader &response) {
   return Ref<const ElementNode>(document->GetDocumentElement());
 }
 
-void CheckSoapFault(const ElementNode &envelope, FaultListener *listener) {
+void CheckSoapFault(const ElementNode &envelope, FaultListener *listener, const ServiceDialect &dialect) {
   const ElementNode *const fault = FindDescendant(&envelope, {"Body", "Fault"});
   if (!fault) {
     return;
@@ -84,7 +85,7 @@ void CheckSoapFault(const ElementNode &envelope, FaultListener *listener) {
   QName name;
   ResolveQName(*faultCode, codeText->GetValue(), Namespaces::SOAPENV, name);
   const std::string faultString = GetText(GetTextNode(fault->FindChildElement("faultstring")));
-  if (IsAuthenticationFailure(name)) {
+  if (Contains(AUTHENTICATION_FAULTS, name) || Contains(dialect.credentialFaults, name)) {
     throw InvalidCredentialsException("Authentication failed" + (faultString.empty() ? "" : ": " + faultString));
   }
   throw SsoException("Unexpected SOAP fault: " + GetText(codeText) + "; request failed.");

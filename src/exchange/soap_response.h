@@ -6,6 +6,7 @@
 
 #include "exchange/fault_listener.h"
 
+#include <ssoclient/service_dialect.h>
 #include <tarvel/core/ref.h>
 #include <tarvel/io/reader.h>
 #include <tarvel/xml/node.h>
@@ -22,10 +23,12 @@ Tarvel::Ref<const Tarvel::Xml::ElementNode> ParseResponseDocument(Tarvel::Reader
 
 /// Checks that there is no SOAP 1.1 fault in the body of `envelope`.
 /// @param listener receives the fault before the exception is thrown; null for none
+/// @param dialect names further faults with which the service refuses credentials
 /// @throws InvalidCredentialsException for a fault that says that authentication failed.
 /// @throws SsoException for every other fault.
 /// @throws ParseException for a fault code whose prefix is not bound.
-void CheckSoapFault(const Tarvel::Xml::ElementNode &envelope, FaultListener *listener = nullptr);
+void CheckSoapFault(const Tarvel::Xml::ElementNode &envelope, FaultListener *listener = nullptr,
+                    const ServiceDialect &dialect = {});
 
 /// Follows a path of local names down from `start`, to the first child with each name. Null when there is no such
 /// child, and when `start` is null.

@@ -9,11 +9,13 @@
 namespace SsoClient {
 
 XMLBodyBuilderInitialSPNego::XMLBodyBuilderInitialSPNego(SamlToken::ConfirmationType confirmation,
-                                                         const TokenSpec &spec, const std::vector<std::uint8_t> &leg)
-    : m_confirmation(confirmation), m_spec(spec), m_leg(leg) {}
+                                                         const TokenSpec &spec, const std::vector<std::uint8_t> &leg,
+                                                         const ServiceDialect &dialect,
+                                                         const Tarvel::Crypto::Certificate *certificate)
+    : m_confirmation(confirmation), m_spec(spec), m_leg(leg), m_dialect(dialect), m_certificate(certificate) {}
 
 void XMLBodyBuilderInitialSPNego::build(Tarvel::Ref<Tarvel::Xml::ElementNode> &out) const {
-  XMLCompositeBuilder request(AcquireSecurityTokenBuilder(m_confirmation, m_spec));
+  XMLCompositeBuilder request(AcquireSecurityTokenBuilder(m_confirmation, m_spec, m_dialect, m_certificate));
   request.Add(WstSPNegoBinExchangeBuilder(m_leg));
   request.build(out);
   out->DefineAttribute("Context", "urn:uuid:" + Tarvel::StringUtil::GenerateUuid());

@@ -7,7 +7,9 @@
 #include "compose/xml_builder.h"
 
 #include <ssoclient/saml_token.h>
+#include <ssoclient/service_dialect.h>
 #include <ssoclient/token_spec.h>
+#include <tarvel/crypto/certificate.h>
 
 #include <cstdint>
 #include <string>
@@ -19,8 +21,10 @@ namespace SsoClient {
 /// UUID.
 class XMLBodyBuilderInitialSPNego final : public XMLBaseBuilder {
 public:
+  /// @param certificate see `AcquireSecurityTokenBuilder`. Not owned: it must live as long as the builder.
   XMLBodyBuilderInitialSPNego(SamlToken::ConfirmationType confirmation, const TokenSpec &spec,
-                              const std::vector<std::uint8_t> &leg);
+                              const std::vector<std::uint8_t> &leg, const ServiceDialect &dialect = {},
+                              const Tarvel::Crypto::Certificate *certificate = nullptr);
 
   void build(Tarvel::Ref<Tarvel::Xml::ElementNode> &out) const override;
 
@@ -28,6 +32,8 @@ private:
   SamlToken::ConfirmationType m_confirmation;
   TokenSpec m_spec;
   std::vector<std::uint8_t> m_leg;
+  ServiceDialect m_dialect;
+  const Tarvel::Crypto::Certificate *m_certificate;
 };
 
 /// A further leg: a response element with the `Context` that the service has chosen for the negotiation.

@@ -24,11 +24,13 @@ std::shared_ptr<GssNegotiationContext> CreateGssNegotiationContext(const Securit
 std::shared_ptr<GssNegotiationContext> CreateGssNegotiationContext(const SecurityTokenServiceConfig &config,
                                                                    const TokenSpec &spec,
                                                                    const ServiceOptions &options) {
-  auto requestBuilder = std::make_shared<const RequestBuilderImpl>(config.holderOfKeyConfig);
+  CheckServiceDialect(options.dialect);
+  auto requestBuilder =
+      std::make_shared<const RequestBuilderImpl>(config.holderOfKeyConfig, options.dialect, config.stsUrl);
   // `useDomainControllerName` is ignored, because the Kerberos ticket is for the host in the address.
   const HttpsClient client(config.stsUrl, Tarvel::Ref<Tarvel::Ssl::SSLContext>(config.sslContext), config.sslParameter,
-                           LEG_TIMEOUT_MICROSECONDS);
-  auto responseHandler = std::make_shared<const ResponseHandlerImpl>();
+                           LEG_TIMEOUT_MICROSECONDS, false, options.dialect);
+  auto responseHandler = std::make_shared<const ResponseHandlerImpl>(options.dialect);
   return std::make_shared<GssNegotiationContextImpl>(spec, std::move(requestBuilder), client.CreateSession(),
                                                      std::move(responseHandler), config.signingCertificates, options);
 }

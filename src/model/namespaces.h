@@ -12,10 +12,14 @@
 namespace SsoClient::Namespaces {
 
 constexpr std::string_view SOAPENV = "http://schemas.xmlsoap.org/soap/envelope/";
+constexpr std::string_view SOAP12 = "http://www.w3.org/2003/05/soap-envelope";
 constexpr std::string_view WSSE = "http://docs.oasis-open.org/wss/2004/01/oasis-200401-wss-wssecurity-secext-1.0.xsd";
 constexpr std::string_view WSSE11 = "http://docs.oasis-open.org/wss/oasis-wss-wssecurity-secext-1.1.xsd";
 constexpr std::string_view WSU = "http://docs.oasis-open.org/wss/2004/01/oasis-200401-wss-wssecurity-utility-1.0.xsd";
 constexpr std::string_view WST = SSOCLIENT_WS_TRUST;
+constexpr std::string_view WST14 = "http://docs.oasis-open.org/ws-sx/ws-trust/200802";
+constexpr std::string_view WSP = "http://schemas.xmlsoap.org/ws/2004/09/policy";
+constexpr std::string_view WSS4J = "http://ws.apache.org/wss4j";
 constexpr std::string_view WSA = "http://www.w3.org/2005/08/addressing";
 constexpr std::string_view SAML = "urn:oasis:names:tc:SAML:2.0:assertion";
 constexpr std::string_view DS = "http://www.w3.org/2000/09/xmldsig#";

@@ -29,11 +29,13 @@ std::shared_ptr<SecurityTokenService> CreateSecurityTokenService(const SecurityT
 
 std::shared_ptr<SecurityTokenService> CreateSecurityTokenService(const SecurityTokenServiceConfig &config,
                                                                  const ServiceOptions &options) {
-  auto requestBuilder = std::make_shared<const RequestBuilderImpl>(config.holderOfKeyConfig);
+  CheckServiceDialect(options.dialect);
+  auto requestBuilder =
+      std::make_shared<const RequestBuilderImpl>(config.holderOfKeyConfig, options.dialect, config.stsUrl);
   auto transport = std::make_shared<const HttpsClient>(
       config.stsUrl, Tarvel::Ref<Tarvel::Ssl::SSLContext>(config.sslContext), config.sslParameter,
-      REQUEST_TIMEOUT_MICROSECONDS, config.useDomainControllerName);
-  auto responseHandler = std::make_shared<const ResponseHandlerImpl>();
+      REQUEST_TIMEOUT_MICROSECONDS, config.useDomainControllerName, options.dialect);
+  auto responseHandler = std::make_shared<const ResponseHandlerImpl>(options.dialect);
   return std::make_shared<SecurityTokenServiceImpl>(std::move(requestBuilder), std::move(transport),
                                                     std::move(responseHandler), config.signingCertificates, options);
 }

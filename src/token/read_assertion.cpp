@@ -23,7 +23,7 @@ boost::optional<std::string> TextOrNone(const std::string &text) {
 
 } // namespace
 
-ReadAssertion::ReadAssertion() {
+ReadAssertion::ReadAssertion(SamlAssertionType &record) : assertion(record) {
   assertion.IssueInstant = Unread();
   assertion.Conditions.NotBefore = Unread();
   assertion.Conditions.NotOnOrAfter = Unread();

@@ -10,9 +10,10 @@
 
 namespace SsoClient {
 
-/// What the parser could read of an assertion. If the assertion has the accepted form, that is everything.
+/// What a parser could read of an assertion. If the assertion has the accepted form, that is everything.
 struct ReadAssertion {
-  ReadAssertion();
+  /// Marks the dates of `record` as not read. Make it before a parser fills the record, which must outlive it.
+  explicit ReadAssertion(SamlAssertionType &record);
 
   /// Whether this date of `assertion` could be read.
   bool HasDate(const Tarvel::System::DateTime &date) const noexcept;
@@ -28,7 +29,7 @@ struct ReadAssertion {
   /// Removes the delegates that could not be read.
   void RemoveUnreadDelegates();
 
-  SamlAssertionType assertion;
+  SamlAssertionType &assertion;
   bool isFormAccepted = false;
 };
 

@@ -36,11 +36,44 @@ std::string ForValidity(const Finding &finding) {
     return "Ask the service's operator to issue tokens whose NotBefore is before their NotOnOrAfter.";
   }
   const std::string seconds = std::to_string(finding.missedBySec);
-  if (finding.attribute == "NotBefore") {
+  if (finding.attribute == "NotBefore" || finding.attribute == "IssueInstant") {
     return "Synchronise this machine's clock (it seems at least " + seconds + " s behind), or the service's.";
   }
   return "Get a new token. If this one is new, synchronise this machine's clock (it seems at least " + seconds +
          " s ahead), or the service's.";
+}
+
+/// What to do if the confirmation states something other than `VerifyOptions` require.
+std::string ForStatedConfirmation(const Finding &finding) {
+  if (finding.attribute == "Recipient") {
+    return "Ask the service for a token whose recipient is one of " + finding.wanted +
+           "; or accept the token's recipient, if it is an address of this program.";
+  }
+  if (finding.attribute == "InResponseTo") {
+    return "Use the token that answers the request " + finding.wanted + ". One that answers another may be replayed.";
+  }
+  if (finding.attribute == "Address") {
+    return "Accept the token only from the sender to whom it was issued.";
+  }
+  return "Ask the service for a bearer or a holder-of-key token.";
+}
+
+std::string ForConfirmation(const Finding &finding) {
+  if (finding.missedBySec != 0) {
+    return finding.attribute == "SessionNotOnOrAfter" ? "Authenticate again, and get a new token."
+                                                      : ForValidity(finding);
+  }
+  if (finding.message == "Invalid token subject validity") {
+    return "Ask the service's operator to let the confirmation of bearer tokens last as long as the token.";
+  }
+  if (finding.wanted == "a certificate or an RSA or EC public key") {
+    return "Ask the service's operator to put the certificate or the public key of the holder into the confirmation.";
+  }
+  if (finding.attribute.empty() || finding.attribute == "SessionNotOnOrAfter") {
+    return "Ask the service's operator to issue tokens whose confirmation and session can be used while they are "
+           "valid.";
+  }
+  return ForStatedConfirmation(finding);
 }
 
 const NamedCertificate *FindStranger(const TokenReport &report) {
@@ -109,7 +142,7 @@ std::string RemedyFor(const TokenReport &report, Check check, const Finding &fin
   case Check::VALIDITY:
     return ForValidity(finding);
   case Check::CONFIRMATION:
-    return "Ask the service's operator to let the confirmation of bearer tokens last as long as the token.";
+    return ForConfirmation(finding);
   case Check::DELEGATION:
     return "Ask the service's operator to issue delegated tokens whose confirmation names the last delegate.";
   case Check::ALGORITHMS:
@@ -135,6 +168,12 @@ std::string RemedyFor(const TokenReport &report, Check check, const Finding &fin
     return ForRequiredConfirmation(finding);
   }
   return std::string();
+}
+
+std::string RemedyForOtherForm() {
+  return "Verify the token with the profile SAML2, which reads it, or ask the service's operator to issue tokens of "
+         "the "
+         "accepted form.";
 }
 
 std::string RemedyForSurroundings(bool hasSaml2) {

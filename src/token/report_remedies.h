@@ -15,6 +15,9 @@ namespace SsoClient {
 /// are printable.
 std::string RemedyFor(const TokenReport &report, TokenReport::Check check, const TokenReport::Finding &finding);
 
+/// What to do about a token that only the profile SAML2 reads.
+std::string RemedyForOtherForm();
+
 /// What to do about a document whose document element is not a SAML 2.0 assertion.
 /// @param hasSaml2 whether there is such an assertion in it
 std::string RemedyForSurroundings(bool hasSaml2);

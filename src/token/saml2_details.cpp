@@ -8,6 +8,7 @@
 #include <ssoclient/exceptions.h>
 #include <tarvel/io/writer.h>
 #include <tarvel/xml/security/canonicalizer.h>
+#include <tarvel/xml/security/exceptions.h>
 
 #include <string_view>
 #include <utility>
@@ -129,6 +130,23 @@ std::vector<SamlAttribute> ReadAttributes(const AttributeStatementType &statemen
     attributes.push_back(ReadAttribute(*attribute.element, reader));
   }
   return attributes;
+}
+
+TokenDetails TakeDetails(Saml2Assertion &assertion) {
+  if (assertion.common.AttributeStatement) {
+    assertion.details.attributes = ReadAttributes(*assertion.common.AttributeStatement);
+  }
+  return std::move(assertion.details);
+}
+
+TokenDetails TakeDetailsOfClaims(Saml2Assertion &assertion) {
+  try {
+    return TakeDetails(assertion);
+  } catch (const ParseException &) {
+    return std::move(assertion.details);
+  } catch (const Tarvel::Xml::Security::XmlSecurityException &) {
+    return std::move(assertion.details);
+  }
 }
 
 } // namespace SsoClient

@@ -4,7 +4,7 @@
 
 #pragma once
 
-#include "token/assertion_model.h"
+#include "token/saml2_model.h"
 
 #include <ssoclient/token_details.h>
 #include <tarvel/xml/node.h>
@@ -25,5 +25,12 @@ NameId ReadNameId(const Tarvel::Xml::ElementNode &element);
 /// @throws Tarvel::Xml::Security::XmlSecurityException when such a value has no canonical form. An assertion with a valid
 ///         signature has one.
 std::vector<SamlAttribute> ReadAttributes(const AttributeStatementType &statement);
+
+/// The details of an assertion with its attributes. They are moved.
+/// @throws like `ReadAttributes`.
+TokenDetails TakeDetails(Saml2Assertion &assertion);
+
+/// The same for an assertion that is not verified. If the attributes cannot be read, they are left out.
+TokenDetails TakeDetailsOfClaims(Saml2Assertion &assertion);
 
 } // namespace SsoClient

@@ -33,7 +33,7 @@ struct Saml2Confirmation {
 struct Saml2Assertion {
   /// What both profiles have. The parser fills all but the confirmation of the subject, which `ChooseConfirmation` sets:
   /// `AuthnStatement` stays empty; a missing `NotBefore` is the `IssueInstant`; the audiences of all restrictions are in
-  /// `details` only; delegates have no qualifiers here, but their elements have.
+  /// `details` only; delegates have no qualifiers here, but their elements have; `values` has only values that are texts.
   SamlAssertionType common;
   /// Everything else. `attributes` stays empty: `ReadAttributes` reads them again when they are asked for, because most
   /// callers never ask.

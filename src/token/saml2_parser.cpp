@@ -19,7 +19,7 @@ using Tarvel::Xml::ElementNode;
 /// The assertion at the cursor. If another element is there, that is refused, and the first assertion below it is returned.
 const ElementNode *FindRoot(const NodeFilterIterator &iterator, DeviationSink &sink) {
   NodeFilterIterator next = iterator;
-  const bool isEncrypted = TryRefuseUnsupported(next, sink);
+  const bool isEncrypted = IsSamlElement(iterator, "EncryptedAssertion") && TryRefuseUnsupported(next, sink);
   if (!isEncrypted && RequireElementQName(iterator, "Assertion", Namespaces::SAML, sink)) {
     return IteratorToElement(iterator);
   }

@@ -29,7 +29,7 @@ bool ParseTextValue(NodeFilterIterator &iterator, std::string &value, DeviationS
   return taken.node && RequireTextualContent(taken, value, sink);
 }
 
-/// Reads a value that may be anything. `value` stays empty if it is not one text.
+/// Reads a value that may be anything. Returns whether it is a text.
 bool ParseAnyValue(NodeFilterIterator &iterator, std::string &value, DeviationSink &sink) {
   const NodeFilterIterator taken = TakeListElement(iterator, "AttributeValue", Namespaces::SAML, sink);
   if (!taken.node) {
@@ -40,13 +40,12 @@ bool ParseAnyValue(NodeFilterIterator &iterator, std::string &value, DeviationSi
   while (child.node && !IteratorToElement(child)) {
     child.MoveToSibling();
   }
-  return isEmpty || child.node || RequireTextualContent(taken, value, sink);
+  const bool isXml = child.node;
+  return !isEmpty && !isXml && RequireTextualContent(taken, value, sink);
 }
 
-/// Groups and the solution flag decide about access, so a value that is not a text is refused.
-AttributeValueParser FindValueParser(std::string_view name) {
-  AttributeType attribute;
-  attribute.Name = name;
+/// Groups and the solution flag decide about access, so a value of them that is not a text is refused.
+AttributeValueParser FindValueParser(const AttributeType &attribute) {
   return SamlAttributeIsGroupIdentity(attribute) || SamlAttributeIsSolution(attribute) ? ParseTextValue : ParseAnyValue;
 }
 
@@ -58,7 +57,9 @@ void ParseAttribute(NodeFilterIterator &iterator, AttributeStatementType &statem
   const ElementNode &element = *IteratorToElement(taken);
   RequireSchemaAttributes(element, {SamlType("AttributeType")}, {LocalName("Name")},
                           {LocalName("NameFormat"), LocalName("FriendlyName")}, sink, ForeignAttributes::IGNORED);
-  ReadAttribute(taken, statement.attributes.emplace_back(), FindValueParser(GetTextAttribute(element, "Name")), sink);
+  AttributeType &attribute = statement.attributes.emplace_back();
+  ReadAttributeNames(element, attribute);
+  ReadAttributeValues(taken.GetChild(), attribute.values, FindValueParser(attribute), sink);
 }
 
 void ParseAttributeStatement(NodeFilterIterator &iterator, boost::optional<AttributeStatementType> &statement,

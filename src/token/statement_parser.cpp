@@ -126,21 +126,23 @@ bool ParseAttributeElement(NodeFilterIterator &iterator, AttributeType &attribut
     return false;
   }
   RequireElementAttributesNames(*IteratorToElement(taken), {"Name"}, {"NameFormat", "FriendlyName"}, sink);
-  ReadAttribute(taken, attribute, ParseAttributeValue, sink);
+  ReadAttributeNames(*IteratorToElement(taken), attribute);
+  ReadAttributeValues(taken.GetChild(), attribute.values, ParseAttributeValue, sink);
   return true;
 }
 
-void ReadAttribute(const NodeFilterIterator &iterator, AttributeType &attribute, AttributeValueParser parseValue,
-                   DeviationSink &sink) {
-  const ElementNode &element = *IteratorToElement(iterator);
+void ReadAttributeNames(const ElementNode &element, AttributeType &attribute) {
   attribute.element = &element;
   attribute.Name = GetTextAttribute(element, "Name");
   attribute.NameFormat = GetTextAttribute(element, "NameFormat");
   attribute.FriendlyName = GetTextAttribute(element, "FriendlyName");
-  NodeFilterIterator child = iterator.GetChild();
-  while (child.node) {
-    if (!parseValue(child, attribute.values.emplace_back(), sink)) {
-      attribute.values.pop_back();
+}
+
+void ReadAttributeValues(NodeFilterIterator iterator, std::vector<std::string> &values, AttributeValueParser parseValue,
+                         DeviationSink &sink) {
+  while (iterator.node) {
+    if (!parseValue(iterator, values.emplace_back(), sink)) {
+      values.pop_back();
     }
   }
 }

@@ -14,6 +14,7 @@
 
 #include <cstddef>
 #include <string>
+#include <vector>
 
 namespace SsoClient {
 
@@ -45,11 +46,14 @@ void ParseAttributeStatementElement(NodeFilterIterator &iterator, AttributeState
 bool ParseAttributeElement(NodeFilterIterator &iterator, AttributeType &attribute,
                            DeviationSink &sink = ThrowingSink());
 
-/// A function that reads a `saml:AttributeValue`.
+/// A function that reads a `saml:AttributeValue`. It returns whether `value` was set.
 using AttributeValueParser = bool (*)(NodeFilterIterator &iterator, std::string &value, DeviationSink &sink);
 
-/// Reads names and values of the `saml:Attribute` at the cursor, whose XML attributes the caller has checked.
-void ReadAttribute(const NodeFilterIterator &iterator, AttributeType &attribute, AttributeValueParser parseValue,
-                   DeviationSink &sink);
+/// Reads the names of `element`, a `saml:Attribute` whose XML attributes the caller has checked.
+void ReadAttributeNames(const Tarvel::Xml::ElementNode &element, AttributeType &attribute);
+
+/// Reads the values from the cursor on.
+void ReadAttributeValues(NodeFilterIterator iterator, std::vector<std::string> &values, AttributeValueParser parseValue,
+                         DeviationSink &sink);
 
 } // namespace SsoClient

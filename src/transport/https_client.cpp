@@ -12,8 +12,8 @@ namespace SsoClient {
 
 HttpsClient::HttpsClient(const std::string &url, const Tarvel::Ref<Tarvel::Ssl::SSLContext> &context,
                          const std::string &sslParameter, std::int64_t timeoutMicroseconds,
-                         bool useDomainControllerName)
-    : m_context(context), m_timeoutMicroseconds(timeoutMicroseconds) {
+                         bool useDomainControllerName, const ServiceDialect &dialect)
+    : m_context(context), m_timeoutMicroseconds(timeoutMicroseconds), m_declaresCharset(dialect.declaresCharset) {
   Init(url, sslParameter, useDomainControllerName);
 }
 
@@ -37,7 +37,7 @@ void HttpsClient::Init(const std::string &url, const std::string &sslParameter, 
 }
 
 std::shared_ptr<TransportSession> HttpsClient::CreateSession() const {
-  return std::make_shared<HttpsSession>(m_spec, m_path, m_timeoutMicroseconds);
+  return std::make_shared<HttpsSession>(m_spec, m_path, m_timeoutMicroseconds, m_declaresCharset);
 }
 
 } // namespace SsoClient

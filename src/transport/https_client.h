@@ -6,6 +6,7 @@
 
 #include "transport/transport.h"
 
+#include <ssoclient/service_dialect.h>
 #include <tarvel/core/ref.h>
 #include <tarvel/http/connection_spec.h>
 #include <tarvel/ssl/ssl_context.h>
@@ -24,10 +25,12 @@ public:
   /// @param sslParameter see `CreateSsoSSLConnectionSpec`
   /// @param timeoutMicroseconds for each `SendRequest` of a session, from the connect to the last byte of the response
   /// @param useDomainControllerName see `CreateSsoSSLConnectionSpec`
+  /// @param dialect says whether requests declare their charset
   /// @throws Tarvel::Http::MalformedURLException for a malformed address.
   /// @throws Tarvel::InvalidArgumentException for https without a context.
   HttpsClient(const std::string &url, const Tarvel::Ref<Tarvel::Ssl::SSLContext> &context,
-              const std::string &sslParameter, std::int64_t timeoutMicroseconds, bool useDomainControllerName);
+              const std::string &sslParameter, std::int64_t timeoutMicroseconds, bool useDomainControllerName,
+              const ServiceDialect &dialect = {});
   HttpsClient(const std::string &url, const Tarvel::Ref<Tarvel::Ssl::SSLContext> &context,
               const std::string &sslParameter, std::int64_t timeoutMicroseconds);
 
@@ -40,6 +43,7 @@ private:
   const Tarvel::Ref<Tarvel::Ssl::SSLContext> m_context;
   std::string m_path;
   const std::int64_t m_timeoutMicroseconds;
+  const bool m_declaresCharset;
 };
 
 } // namespace SsoClient

@@ -28,8 +28,9 @@ bool HasBody(int status) {
 } // namespace
 
 HttpsSession::HttpsSession(const Ref<Tarvel::Http::ConnectionSpec> &spec, const std::string &path,
-                           std::int64_t timeoutMicroseconds)
-    : m_path(path), m_timeoutMicroseconds(timeoutMicroseconds) {
+                           std::int64_t timeoutMicroseconds, bool declaresCharset)
+    : m_path(path), m_timeoutMicroseconds(timeoutMicroseconds),
+      m_contentType(declaresCharset ? "text/xml; charset=utf-8" : "text/xml") {
   Ref<Tarvel::Http::CookieStore> cookies;
   Tarvel::Http::CreateCookieStore("", cookies);
   Tarvel::Http::CreateHttpUserAgent(spec, cookies, nullptr, m_userAgent);
@@ -70,7 +71,7 @@ void HttpsSession::Start(const Request &request, const Completion &completion,
                          const std::shared_ptr<ResponseFacts> &facts, Ref<PendingRequestItem> &pending) {
   Ref<ClientRequest> message;
   Tarvel::Http::CreateHttpRequest("POST", m_path, message);
-  message->SetHeader("Content-Type", "text/xml");
+  message->SetHeader("Content-Type", m_contentType);
   message->SetHeader("SOAPAction", '"' + request.soapAction + '"');
   message->WriteBody(request.body);
   m_userAgent->StartRequest(

@@ -22,8 +22,9 @@ namespace SsoClient {
 /// next leg, and in no other session.
 class HttpsSession final : public TransportSession {
 public:
+  /// @param declaresCharset whether `Content-Type` has the charset
   HttpsSession(const Tarvel::Ref<Tarvel::Http::ConnectionSpec> &spec, const std::string &path,
-               std::int64_t timeoutMicroseconds);
+               std::int64_t timeoutMicroseconds, bool declaresCharset = false);
 
   void SendRequest(const Request &request, Tarvel::Ref<Tarvel::Reader> &response) override;
 
@@ -43,6 +44,7 @@ private:
   Tarvel::Ref<Tarvel::Http::UserAgent> m_userAgent;
   const std::string m_path;
   const std::int64_t m_timeoutMicroseconds;
+  const char *const m_contentType;
 };
 
 /// Sets either `error` or `body` from the outcome of an HTTP exchange, and leaves the other unchanged. With

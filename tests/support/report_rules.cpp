@@ -241,6 +241,7 @@ std::string ClaimsLikeAToken(UnverifiedClaims claims) {
 
 UnverifiedClaims ClaimsOf(const SamlToken &token) {
   UnverifiedClaims claims;
+  claims.details = GetTokenDetails(token);
   claims.id = token.GetId();
   claims.subject = token.GetSubject();
   claims.startDate = token.GetStartDate();

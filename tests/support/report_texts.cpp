@@ -101,6 +101,68 @@ void DescribeLists(std::ostream &out, const UnverifiedClaims &claims) {
   }
 }
 
+void DescribeNameId(std::ostream &out, const char *name, const NameId &nameId) {
+  out << name << " {" << nameId.value << "}\n";
+  DescribeText(out, "format", nameId.format);
+  DescribeText(out, "qualifier", nameId.nameQualifier);
+  DescribeText(out, "service's qualifier", nameId.spNameQualifier);
+  DescribeText(out, "service's name", nameId.spProvidedId);
+}
+
+void DescribeConfirmation(std::ostream &out, const ConfirmationDetails &confirmation) {
+  out << "confirmation {" << confirmation.method << "} " << confirmation.publicKey.size() << '\n';
+  if (confirmation.nameId) {
+    DescribeNameId(out, "confirming", *confirmation.nameId);
+  }
+  DescribeDate(out, "from", confirmation.notBefore);
+  DescribeDate(out, "to", confirmation.notOnOrAfter);
+  DescribeText(out, "recipient", confirmation.recipient);
+  DescribeText(out, "request", confirmation.inResponseTo);
+  DescribeText(out, "address", confirmation.address);
+  out << "key " << (confirmation.certificate ? confirmation.certificate->GetSha256Thumbprint() : "none") << '\n';
+}
+
+void DescribeConditions(std::ostream &out, const TokenDetails &details) {
+  for (const std::set<std::string> &audiences : details.audienceRestrictions) {
+    out << "restriction";
+    for (const std::string &audience : audiences) {
+      out << " {" << audience << "}";
+    }
+    out << '\n';
+  }
+  out << "used once " << details.isOneTimeUse << '\n';
+  if (details.proxyRestriction) {
+    out << "proxies " << details.proxyRestriction->count.value_or(~std::uint64_t(0));
+    for (const std::string &audience : details.proxyRestriction->audiences) {
+      out << " {" << audience << "}";
+    }
+    out << '\n';
+  }
+}
+
+void DescribeStatements(std::ostream &out, const TokenDetails &details) {
+  for (const AuthnStatementDetails &statement : details.authnStatements) {
+    out << "authenticated " << statement.authnInstant.GetUtcTime() << '\n';
+    DescribeText(out, "session", statement.sessionIndex);
+    DescribeDate(out, "session end", statement.sessionNotOnOrAfter);
+    DescribeText(out, "at", statement.localityAddress);
+    DescribeText(out, "host", statement.localityDnsName);
+    DescribeText(out, "class", statement.contextClass);
+    DescribeText(out, "declaration", statement.contextDeclaration);
+    for (const std::string &authority : statement.authenticatingAuthorities) {
+      out << "authority {" << authority << "}\n";
+    }
+  }
+  for (const SamlAttribute &attribute : details.attributes) {
+    out << "attribute {" << attribute.name << "}\n";
+    DescribeText(out, "format", attribute.nameFormat);
+    DescribeText(out, "friendly name", attribute.friendlyName);
+    for (const AttributeValue &value : attribute.values) {
+      out << "value " << value.isXml << value.isNil << " {" << value.text << "}\n";
+    }
+  }
+}
+
 void DescribeSignature(std::ostream &out, const TokenReport &report) {
   for (const TokenReport::Reference &reference : report.references) {
     out << "reference " << reference.resolves << reference.coversToken << reference.digestMatches << '\n';
@@ -167,6 +229,21 @@ std::string DescribeClaims(const UnverifiedClaims &claims) {
   DescribeFlag(out, "solution", claims.solution);
   DescribeSubject(out, claims);
   DescribeLists(out, claims);
+  out << (claims.details ? DescribeDetails(*claims.details) : "no details\n");
+  return out.str();
+}
+
+std::string DescribeDetails(const TokenDetails &details) {
+  std::ostringstream out;
+  DescribeNameId(out, "issuer", details.issuer);
+  out << "issued " << details.issueInstant.GetUtcTime() << '\n';
+  DescribeNameId(out, "subject", details.subject);
+  for (const ConfirmationDetails &confirmation : details.confirmations) {
+    DescribeConfirmation(out, confirmation);
+  }
+  out << "used confirmation " << details.usedConfirmation << '\n';
+  DescribeConditions(out, details);
+  DescribeStatements(out, details);
   return out.str();
 }
 

@@ -26,4 +26,7 @@ std::string DescribeReport(const SsoClient::TokenReport &report);
 /// Everything in `claims`.
 std::string DescribeClaims(const SsoClient::UnverifiedClaims &claims);
 
+/// Everything in `details`.
+std::string DescribeDetails(const SsoClient::TokenDetails &details);
+
 } // namespace Testing

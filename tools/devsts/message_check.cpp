@@ -5,12 +5,16 @@
 #include "token_reader.h"
 
 #include <algorithm>
+#include <set>
 
 namespace DevSts {
 
 namespace {
 
 constexpr std::chrono::hours LONGEST_MESSAGE_LIFE(24);
+constexpr const char *COVERAGE =
+    "the signature must cover the body and the timestamp, and nothing else but headers of WS-Addressing";
+constexpr const char *HEADERS = "the message must have one security header and no other";
 
 /// The elements that the security header may have, each at most once.
 struct SecurityHeader {
@@ -23,6 +27,7 @@ struct SecurityHeader {
 
 struct Envelope {
   xmlNode *body = nullptr;
+  std::vector<const xmlNode *> addressing; ///< the header elements of WS-Addressing, whose content is not examined
   SecurityHeader security;
 };
 
@@ -68,14 +73,26 @@ Envelope ReadEnvelope(const xmlDoc &document) {
   if (parts.size() != 2 || !IsElement(*parts[0], Ns::SOAPENV, "Header") || !IsElement(*parts[1], Ns::SOAPENV, "Body")) {
     throw Refusal(Code::CLIENT, "an envelope must contain one header and one body");
   }
-  const std::vector<xmlNode *> headers = ChildElements(*parts[0]);
-  if (headers.size() != 1 || !IsElement(*headers[0], Ns::WSSE, "Security")) {
-    RefuseSecurity("the message must have one security header and no other");
+  Envelope envelope;
+  envelope.body = parts[1];
+  const xmlNode *security = nullptr;
+  for (const xmlNode *header : ChildElements(*parts[0])) {
+    if (IsOf(*header, Ns::WSA)) {
+      envelope.addressing.push_back(header);
+    } else if (IsElement(*header, Ns::WSSE, "Security") && !security) {
+      security = header;
+    } else {
+      RefuseSecurity(HEADERS);
+    }
   }
-  if (ChildElements(*parts[1]).size() != 1) {
+  if (!security) {
+    RefuseSecurity(HEADERS);
+  }
+  if (ChildElements(*envelope.body).size() != 1) {
     throw Refusal(Code::INVALID_REQUEST, "the body must contain one element");
   }
-  return {parts[1], ReadSecurityHeader(*headers[0])};
+  envelope.security = ReadSecurityHeader(*security);
+  return envelope;
 }
 
 Time ReadTime(const xmlNode &timestamp, const char *name) {
@@ -109,20 +126,22 @@ PasswordCredentials ReadCredentials(const xmlNode &usernameToken) {
   return {TextOf(RequireChild(usernameToken, Ns::WSSE, "Username")), TextOf(password)};
 }
 
-/// The signed elements must be the body and the timestamp of this envelope, and no others.
+/// The signed elements must be the body and the timestamp of this envelope, each once, and otherwise only its header
+/// elements of WS-Addressing.
 void RequireCoverage(const Envelope &envelope, const Identifiers &identifiers) {
-  std::vector<const xmlNode *> covered;
+  std::set<const xmlNode *> uncovered = {envelope.body, envelope.security.timestamp};
+  std::set<const xmlNode *> optional(envelope.addressing.begin(), envelope.addressing.end());
   for (const SignatureReference &reference : ReadReferences(*envelope.security.signature)) {
     const auto found = identifiers.find(reference.id);
     if (reference.isEnveloped || found == identifiers.end()) {
       RefuseSecurity("the signature refers to an element that does not exist");
     }
-    covered.push_back(found->second);
+    if (uncovered.erase(found->second) + optional.erase(found->second) == 0) {
+      RefuseSecurity(COVERAGE);
+    }
   }
-  const bool bodyCovered = std::count(covered.begin(), covered.end(), envelope.body) == 1;
-  const bool timestampCovered = std::count(covered.begin(), covered.end(), envelope.security.timestamp) == 1;
-  if (covered.size() != 2 || !bodyCovered || !timestampCovered) {
-    RefuseSecurity("the signature must cover the body and the timestamp, and nothing else");
+  if (!uncovered.empty()) {
+    RefuseSecurity(COVERAGE);
   }
 }
 

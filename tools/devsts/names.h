@@ -17,6 +17,7 @@ constexpr Namespace SOAPENV{"soapenv", "http://schemas.xmlsoap.org/soap/envelope
 constexpr Namespace WSSE{"wsse", "http://docs.oasis-open.org/wss/2004/01/oasis-200401-wss-wssecurity-secext-1.0.xsd"};
 constexpr Namespace WSU{"wsu", "http://docs.oasis-open.org/wss/2004/01/oasis-200401-wss-wssecurity-utility-1.0.xsd"};
 constexpr Namespace WST{"wst", "http://docs.oasis-open.org/ws-sx/ws-trust/200512"};
+constexpr Namespace WST14{"wst14", "http://docs.oasis-open.org/ws-sx/ws-trust/200802"};
 constexpr Namespace WSA{"wsa", "http://www.w3.org/2005/08/addressing"};
 constexpr Namespace SAML{"saml", "urn:oasis:names:tc:SAML:2.0:assertion"};
 constexpr Namespace DS{"ds", "http://www.w3.org/2000/09/xmldsig#"};
@@ -32,11 +33,14 @@ constexpr const char *RSA_SHA256 = "http://www.w3.org/2001/04/xmldsig-more#rsa-s
 constexpr const char *SHA256 = "http://www.w3.org/2001/04/xmlenc#sha256";
 
 constexpr const char *SAML_TOKEN_TYPE = "urn:oasis:names:tc:SAML:2.0:assertion";
+constexpr const char *SAML_PROFILE_TOKEN_TYPE =
+    "http://docs.oasis-open.org/wss/oasis-wss-saml-token-profile-1.1#SAMLV2.0";
 constexpr const char *BEARER_METHOD = "urn:oasis:names:tc:SAML:2.0:cm:bearer";
 constexpr const char *HOLDER_OF_KEY_METHOD = "urn:oasis:names:tc:SAML:2.0:cm:holder-of-key";
 constexpr const char *PASSWORD_CONTEXT = "urn:oasis:names:tc:SAML:2.0:ac:classes:PasswordProtectedTransport";
 constexpr const char *CERTIFICATE_CONTEXT = "urn:oasis:names:tc:SAML:2.0:ac:classes:X509";
 constexpr const char *KERBEROS_CONTEXT = "urn:oasis:names:tc:SAML:2.0:ac:classes:Kerberos";
+constexpr const char *UNSPECIFIED_CONTEXT = "urn:oasis:names:tc:SAML:2.0:ac:classes:unspecified";
 constexpr const char *ENTITY_FORMAT = "urn:oasis:names:tc:SAML:2.0:nameid-format:entity";
 constexpr const char *UPN_FORMAT = "http://schemas.xmlsoap.org/claims/UPN";
 

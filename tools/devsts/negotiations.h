@@ -13,6 +13,7 @@
 #include <map>
 #include <memory>
 #include <mutex>
+#include <optional>
 #include <string>
 #include <vector>
 
@@ -22,6 +23,8 @@ namespace DevSts {
 struct NegotiatedRequest {
   TokenFacts facts;
   std::chrono::milliseconds lifetime{0};
+  std::string tokenType;
+  std::optional<std::string> onBehalfOf;
 };
 
 struct NegotiationStep {

@@ -21,9 +21,9 @@ xmlNode &BodyOf(xmlDoc &envelope) {
   return *ChildElements(*xmlDocGetRootElement(&envelope)).front();
 }
 
-xmlNode &AddTokenResponse(xmlNode &parent, const xmlDoc &token) {
+xmlNode &AddTokenResponse(xmlNode &parent, const xmlDoc &token, const std::string &tokenType) {
   xmlNode &response = AddElement(parent, Ns::WST, "RequestSecurityTokenResponse");
-  AddElement(response, Ns::WST, "TokenType", SAML_TOKEN_TYPE);
+  AddElement(response, Ns::WST, "TokenType", tokenType);
   xmlNode &requested = AddElement(response, Ns::WST, "RequestedSecurityToken");
   xmlNode *const copy = xmlDocCopyNode(xmlDocGetRootElement(&token), parent.doc, 1);
   if (!copy) {
@@ -45,9 +45,9 @@ void AddLeg(xmlNode &response, const std::string &context, const std::vector<uns
 
 } // namespace
 
-Document IssueResponse(const xmlDoc &token) {
+Document IssueResponse(const xmlDoc &token, const std::string &tokenType) {
   Document document = NewEnvelope();
-  AddTokenResponse(AddElement(BodyOf(*document), Ns::WST, "RequestSecurityTokenResponseCollection"), token);
+  AddTokenResponse(AddElement(BodyOf(*document), Ns::WST, "RequestSecurityTokenResponseCollection"), token, tokenType);
   return document;
 }
 
@@ -57,16 +57,17 @@ Document LegResponse(const std::string &context, const std::vector<unsigned char
   return document;
 }
 
-Document NegotiatedResponse(const std::string &context, const std::vector<unsigned char> &leg, const xmlDoc &token) {
+Document NegotiatedResponse(const std::string &context, const std::vector<unsigned char> &leg, const xmlDoc &token,
+                            const std::string &tokenType) {
   Document document = NewEnvelope();
   xmlNode &collection = AddElement(BodyOf(*document), Ns::WST, "RequestSecurityTokenResponseCollection");
-  AddLeg(AddTokenResponse(collection, token), context, leg);
+  AddLeg(AddTokenResponse(collection, token, tokenType), context, leg);
   return document;
 }
 
-Document RenewResponse(const xmlDoc &token) {
+Document RenewResponse(const xmlDoc &token, const std::string &tokenType) {
   Document document = NewEnvelope();
-  AddTokenResponse(BodyOf(*document), token);
+  AddTokenResponse(BodyOf(*document), token, tokenType);
   return document;
 }
 

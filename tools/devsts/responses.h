@@ -12,17 +12,18 @@
 
 namespace DevSts {
 
-/// The answer to an issue request: the token in a response in a collection.
-Document IssueResponse(const xmlDoc &token);
+/// The answer to an issue request: the token, which has the type that was asked for, in a response in a collection.
+Document IssueResponse(const xmlDoc &token, const std::string &tokenType);
 
 /// The answer to a leg of an unfinished negotiation: the service's leg.
 Document LegResponse(const std::string &context, const std::vector<unsigned char> &leg);
 
 /// The answer to the last leg: the token, and the service's leg unless it is empty.
-Document NegotiatedResponse(const std::string &context, const std::vector<unsigned char> &leg, const xmlDoc &token);
+Document NegotiatedResponse(const std::string &context, const std::vector<unsigned char> &leg, const xmlDoc &token,
+                            const std::string &tokenType);
 
 /// The answer to a renew request: the token in a response.
-Document RenewResponse(const xmlDoc &token);
+Document RenewResponse(const xmlDoc &token, const std::string &tokenType);
 
 /// The answer to a validate request.
 Document ValidateResponse(bool isValid);

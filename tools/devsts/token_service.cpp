@@ -36,12 +36,17 @@ std::string ProofCertificate(const CheckedMessage &message, const TrustRequest &
   if (!message.signer) {
     throw Refusal(Code::INVALID_REQUEST, "the request asks for a holder-of-key token without proof of a key");
   }
-  // A request for an exchange has no wst:UseKey: the key is the presented token's.
-  const bool mayOmitUseKey = message.presentedToken.has_value();
-  if (request.useKey ? *request.useKey != message.signatureId : !mayOmitUseKey) {
+  if (request.useKey && *request.useKey != message.signatureId) {
     throw Refusal(Code::INVALID_REQUEST, "wst:UseKey does not refer to the message's signature");
   }
-  return EncodeCertificate(*message.signer);
+  std::string signer = EncodeCertificate(*message.signer);
+  if (request.useKeyCertificate) {
+    const Certificate given = DecodeCertificate(*request.useKeyCertificate);
+    if (!given || EncodeCertificate(*given) != signer) {
+      throw Refusal(Code::INVALID_REQUEST, "wst:UseKey does not contain the certificate of the message's signature");
+    }
+  }
+  return signer;
 }
 
 void ApplyDelegation(TokenFacts &facts, const TrustRequest &request, const CheckedMessage &message) {
@@ -77,6 +82,7 @@ void ApplyRequest(TokenFacts &facts, const CheckedMessage &message, const TrustR
 
 void SetUser(TokenFacts &facts, const User &user, const char *context) {
   facts.subject = user.name;
+  facts.groups.clear();
   facts.authenticated = Now();
   facts.context = context;
   facts.first = user.first;
@@ -176,11 +182,15 @@ Document TokenService::Issue(const CheckedMessage &message, const TrustRequest &
     return BeginNegotiation(message, request, fault, log);
   }
   TokenFacts facts = Authenticate(message);
+  if (request.onBehalfOf) {
+    facts = TokenFacts();
+    SetParty(facts, *request.onBehalfOf);
+  }
   ApplyRequest(facts, message, request);
   SetLife(facts, request.lifetime);
   const Document token = MakeToken(facts, fault.token);
   log = Summary(message.presentedToken ? "exchanged, issued" : "issued", facts, *token);
-  return IssueResponse(*token);
+  return IssueResponse(*token, request.tokenType);
 }
 
 Document TokenService::BeginNegotiation(const CheckedMessage &message, const TrustRequest &request, const Fault &fault,
@@ -192,6 +202,8 @@ Document TokenService::BeginNegotiation(const CheckedMessage &message, const Tru
   NegotiatedRequest negotiated;
   ApplyRequest(negotiated.facts, message, request);
   negotiated.lifetime = request.lifetime;
+  negotiated.tokenType = request.tokenType;
+  negotiated.onBehalfOf = request.onBehalfOf;
   const std::vector<unsigned char> leg = ReadLeg(*request.binaryExchange);
   return AnswerLeg(context, RequireNegotiations().Begin(context, leg, std::move(negotiated)), fault, log);
 }
@@ -214,10 +226,13 @@ Document TokenService::AnswerLeg(const std::string &context, NegotiationStep ste
   }
   TokenFacts &facts = step.request.facts;
   SetClient(facts, *step.leg.client);
+  if (step.request.onBehalfOf) {
+    SetParty(facts, *step.request.onBehalfOf);
+  }
   SetLife(facts, step.request.lifetime);
   const Document token = MakeToken(facts, fault.token);
   log = Summary("negotiated, issued", facts, *token);
-  return NegotiatedResponse(context, step.leg.answer, *token);
+  return NegotiatedResponse(context, step.leg.answer, *token, step.request.tokenType);
 }
 
 Negotiations &TokenService::RequireNegotiations() const {
@@ -244,7 +259,7 @@ Document TokenService::Renew(const CheckedMessage &message, const TrustRequest &
   SetLife(facts, request.lifetime);
   const Document token = MakeToken(facts, fault.token);
   log = Summary("renewed, issued", facts, *token);
-  return RenewResponse(*token);
+  return RenewResponse(*token, request.tokenType);
 }
 
 Document TokenService::Validate(const CheckedMessage &message, const TrustRequest &request, std::string &log) const {
@@ -291,6 +306,14 @@ void TokenService::SetClient(TokenFacts &facts, const std::string &principal) co
     throw Refusal(Code::FAILED_AUTHENTICATION, "unknown user " + principal);
   }
   SetUser(facts, *user, KERBEROS_CONTEXT);
+}
+
+void TokenService::SetParty(TokenFacts &facts, const std::string &name) const {
+  const User *const user = m_users.Find(name);
+  if (!user) {
+    throw Refusal(Code::REQUEST_FAILED, "unknown user " + name + " in wst:OnBehalfOf");
+  }
+  SetUser(facts, *user, UNSPECIFIED_CONTEXT);
 }
 
 TokenFacts TokenService::FactsOfCertificate(X509 &certificate) const {

@@ -52,6 +52,7 @@ private:
   TokenFacts FactsOfUser(const PasswordCredentials &credentials) const;
   TokenFacts FactsOfCertificate(X509 &certificate) const;
   void SetClient(TokenFacts &facts, const std::string &principal) const;
+  void SetParty(TokenFacts &facts, const std::string &name) const;
   Negotiations &RequireNegotiations() const;
   Document MakeToken(TokenFacts facts, TokenFault fault) const;
 

@@ -4,6 +4,9 @@
 
 #include "refusal.h"
 
+#include <algorithm>
+#include <initializer_list>
+
 namespace DevSts {
 
 namespace {
@@ -25,11 +28,16 @@ bool ReadBoolean(const std::string &text) {
   return text == "true";
 }
 
-void RequireTokenType(const xmlNode &request, const std::string &expected) {
-  const std::string type = TextOf(RequireChild(request, Ns::WST, "TokenType"));
-  if (type != expected) {
+std::string ReadTokenType(const xmlNode &request, std::initializer_list<std::string> supported) {
+  std::string type = TextOf(RequireChild(request, Ns::WST, "TokenType"));
+  if (std::find(supported.begin(), supported.end(), type) == supported.end()) {
     RefuseRequest("unsupported token type '" + type + "'");
   }
+  return type;
+}
+
+std::string ReadSamlTokenType(const xmlNode &request) {
+  return ReadTokenType(request, {SAML_TOKEN_TYPE, SAML_PROFILE_TOKEN_TYPE});
 }
 
 RequestType ReadRequestType(const xmlNode &request) {
@@ -60,17 +68,52 @@ std::chrono::milliseconds ReadLifetime(const xmlNode &request) {
   return *expires - *created;
 }
 
-std::optional<std::string> ReadDelegate(const xmlNode &request) {
-  const xmlNode *const delegate = FindChild(request, Ns::WST, "DelegateTo");
-  if (!delegate) {
+/// The name in the username token of the child `element`.
+std::optional<std::string> ReadParty(const xmlNode &request, const char *element, const char *role) {
+  const xmlNode *const party = FindChild(request, Ns::WST, element);
+  if (!party) {
     return std::nullopt;
   }
-  std::string name = TextOf(RequireChild(RequireChild(*delegate, Ns::WSSE, "UsernameToken"), Ns::WSSE, "Username"));
+  std::string name = TextOf(RequireChild(RequireChild(*party, Ns::WSSE, "UsernameToken"), Ns::WSSE, "Username"));
   const std::size_t at = name.rfind('@');
   if (at == std::string::npos || at == 0 || at + 1 == name.size()) {
-    RefuseRequest("the delegate '" + name + "' is not of the form name@domain");
+    RefuseRequest(std::string("the ") + role + " '" + name + "' is not of the form name@domain");
   }
   return name;
+}
+
+void ReadParties(const xmlNode &request, TrustRequest &read) {
+  read.delegateTo = ReadParty(request, "DelegateTo", "delegate");
+  read.onBehalfOf = ReadParty(request, "OnBehalfOf", "party");
+  if (read.delegateTo && read.onBehalfOf) {
+    RefuseRequest("the request has both wst:DelegateTo and wst:OnBehalfOf");
+  }
+  if (FindChild(request, Ns::WST14, "ActAs")) {
+    RefuseRequest("wst14:ActAs is of WS-Trust 1.4; this service has version 1.3");
+  }
+}
+
+void ReadUseKey(const xmlNode &useKey, TrustRequest &read) {
+  const xmlNode *const keyInfo = FindChild(useKey, Ns::DS, "KeyInfo");
+  if (keyInfo) {
+    read.useKeyCertificate =
+        TextOf(RequireChild(RequireChild(*keyInfo, Ns::DS, "X509Data"), Ns::DS, "X509Certificate"));
+  }
+  read.useKey = AttributeOf(useKey, "Sig");
+  if (!keyInfo && !read.useKey) {
+    RefuseRequest("wst:UseKey refers to no signature and contains no ds:KeyInfo");
+  }
+}
+
+/// An element that is left out asks for nothing.
+bool ReadRenewing(const xmlNode &request) {
+  const xmlNode *const renewing = FindChild(request, Ns::WST, "Renewing");
+  return renewing && ReadBoolean(AttributeOf(*renewing, "Allow").value_or(""));
+}
+
+bool ReadDelegatable(const xmlNode &request) {
+  const xmlNode *const delegatable = FindChild(request, Ns::WST, "Delegatable");
+  return delegatable && ReadBoolean(TextOf(*delegatable));
 }
 
 std::vector<std::string> ReadAudience(const xmlNode &request) {
@@ -108,16 +151,16 @@ std::vector<AdviceEntry> ReadAdvice(const xmlNode &request) {
 }
 
 void ReadIssue(const xmlNode &request, TrustRequest &read) {
-  RequireTokenType(request, SAML_TOKEN_TYPE);
+  read.tokenType = ReadSamlTokenType(request);
   read.wantsHolderOfKey = ReadKeyType(request);
   read.lifetime = ReadLifetime(request);
-  read.renewable = ReadBoolean(AttributeOf(RequireChild(request, Ns::WST, "Renewing"), "Allow").value_or(""));
-  read.delegable = ReadBoolean(TextOf(RequireChild(request, Ns::WST, "Delegatable")));
-  read.delegateTo = ReadDelegate(request);
+  read.renewable = ReadRenewing(request);
+  read.delegable = ReadDelegatable(request);
+  ReadParties(request, read);
   read.audience = ReadAudience(request);
   read.advice = ReadAdvice(request);
   if (const xmlNode *useKey = FindChild(request, Ns::WST, "UseKey")) {
-    read.useKey = AttributeOf(*useKey, "Sig").value_or("");
+    ReadUseKey(*useKey, read);
   }
   read.binaryExchange = FindChild(request, Ns::WST, "BinaryExchange");
 }
@@ -151,12 +194,12 @@ TrustRequest ReadTrustRequest(const xmlNode &request) {
     ReadIssue(request, read);
     break;
   case RequestType::RENEW:
-    RequireTokenType(request, SAML_TOKEN_TYPE);
+    read.tokenType = ReadSamlTokenType(request);
     read.lifetime = ReadLifetime(request);
     read.target = ReadTarget(request, "RenewTarget");
     break;
   case RequestType::VALIDATE:
-    RequireTokenType(request, WstUri("/RSTR/Status"));
+    ReadTokenType(request, {WstUri("/RSTR/Status")});
     read.target = ReadTarget(request, "ValidateTarget");
     break;
   }

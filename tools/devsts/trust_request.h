@@ -18,12 +18,16 @@ enum class RequestType { ISSUE, RENEW, VALIDATE };
 
 struct TrustRequest {
   RequestType type = RequestType::ISSUE;
+  std::string tokenType; ///< one of the names of a SAML 2.0 assertion; empty for a validate request
   bool wantsHolderOfKey = false;
   std::optional<std::string> useKey; ///< the identifier of the signature to whose key the token must be bound
+  std::optional<std::string>
+      useKeyCertificate; ///< the certificate to whose key it must be bound, as Base64 of its DER form
   std::chrono::milliseconds lifetime{0};
   bool renewable = false;
   bool delegable = false;
   std::optional<std::string> delegateTo;
+  std::optional<std::string> onBehalfOf; ///< the party that the token must be about
   std::vector<std::string> audience;
   std::vector<AdviceEntry> advice;
   const xmlNode *target = nullptr;         ///< the assertion to renew or validate; null for an issue request

@@ -104,8 +104,11 @@ Document ParseMessage(std::string_view xml) {
 }
 
 bool IsElement(const xmlNode &node, const Namespace &ns, std::string_view name) {
-  return node.type == XML_ELEMENT_NODE && node.ns && xmlStrEqual(node.ns->href, XmlText(ns.uri)) &&
-         name == reinterpret_cast<const char *>(node.name);
+  return node.type == XML_ELEMENT_NODE && IsOf(node, ns) && name == reinterpret_cast<const char *>(node.name);
+}
+
+bool IsOf(const xmlNode &element, const Namespace &ns) {
+  return element.ns && xmlStrEqual(element.ns->href, XmlText(ns.uri));
 }
 
 std::vector<xmlNode *> ChildElements(const xmlNode &parent) {

@@ -32,6 +32,9 @@ Document ParseMessage(std::string_view xml);
 
 bool IsElement(const xmlNode &node, const Namespace &ns, std::string_view name);
 
+/// Whether the name of the element is in the namespace.
+bool IsOf(const xmlNode &element, const Namespace &ns);
+
 /// The children that are elements, in document order.
 std::vector<xmlNode *> ChildElements(const xmlNode &parent);
 

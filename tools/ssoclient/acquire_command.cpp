@@ -5,6 +5,7 @@
 #include "command.h"
 #include "connection.h"
 #include "credentials.h"
+#include "dialect_options.h"
 #include "identity.h"
 #include "operation_events.h"
 #include "refused_token.h"
@@ -19,6 +20,7 @@ namespace {
 
 struct AcquireOptions {
   ConnectionOptions connection;
+  DialectOptions dialect;
   TrustOptions trust;
   CredentialsOptions credentials;
   IdentityOptions identity;
@@ -35,19 +37,25 @@ ExitCode Acquire(const AcquireOptions &options, const OutputOptions &output) {
   ClaimInput(options.credentials, claims);
   CheckIdentity(options.identity, claims);
   CheckConnection(options.connection);
+  ServiceOptions serviceOptions;
+  serviceOptions.dialect = ToDialect(options.dialect);
+  CheckSpecFits(spec, serviceOptions.dialect);
   CheckTokenOutput(options.tokenOutput, output);
 
   const Tarvel::Crypto::CertificateList trusted = LoadTrusted(options.trust, output);
-  RefusedToken refused(options.tokenOutput, output);
-  const auto service = CreateService(options.connection, trusted, LoadIdentity(options.identity),
-                                     {{}, ObserverFor(output), refused.GetSink()});
+  const VerifyOptions verifyOptions = VerifyOptionsOf(options.trust);
+  RefusedToken refused(options.tokenOutput, trusted, verifyOptions, output);
+  serviceOptions.verifyOptions.profile = verifyOptions.profile; // the tolerance is checked below
+  serviceOptions.observer = ObserverFor(output);
+  serviceOptions.refusedTokenSink = refused.GetSink();
+  const auto service = CreateService(options.connection, trusted, LoadIdentity(options.identity), serviceOptions);
   const IssuedToken issued = refused.Explain([&] {
-    IssuedToken acquired = kind.acquire({*service, spec, hasIdentity, options.credentials, options.connection.url,
-                                         trusted, options.trust.toleranceSec, output});
-    RequireWithinTolerance(*acquired.token, trusted, options.trust.toleranceSec, refused.GetSink());
+    IssuedToken acquired = kind.acquire(
+        {*service, spec, hasIdentity, options.credentials, options.connection.url, trusted, verifyOptions, output});
+    RequireWithinTolerance(*acquired.token, trusted, verifyOptions, refused.GetSink());
     return acquired;
   });
-  WriteToken(issued, spec, options.trust.toleranceSec, options.tokenOutput, output);
+  WriteToken(issued, spec, serviceOptions.dialect, options.trust.toleranceSec, options.tokenOutput, output);
   return ExitCode::DONE;
 }
 
@@ -56,6 +64,7 @@ ExitCode Acquire(const AcquireOptions &options, const OutputOptions &output) {
 Action DefineAcquire(CLI::App &app, const OutputOptions &output) {
   const auto options = std::make_shared<AcquireOptions>();
   AddConnectionOptions(app, options->connection);
+  AddDialectOptions(app, options->dialect);
   AddCredentialsOptions(app, options->credentials);
   AddIdentityOptions(app, options->identity);
   AddTokenSpecOptions(app, options->token);

@@ -33,5 +33,6 @@ Action DefineValidate(CLI::App &app, const OutputOptions &output);
 Action DefineVerify(CLI::App &app, const OutputOptions &output);
 Action DefineInspect(CLI::App &app, const OutputOptions &output);
 Action DefineDoctor(CLI::App &app, const OutputOptions &output);
+Action DefineDialect(CLI::App &app, const OutputOptions &output);
 
 } // namespace SsoClient::Tool

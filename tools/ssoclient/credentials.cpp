@@ -41,7 +41,7 @@ void CheckExchange(const TokenSpec &, bool hasIdentity) {
 }
 
 IssuedToken AcquireByToken(const AcquireCall &call) {
-  const auto given = ReadToken(call.credentials.tokenFile, call.trusted, call.toleranceSec);
+  const auto given = ReadToken(call.credentials.tokenFile, call.trusted, call.verifyOptions);
   // The request's signature refers to the token, from which the service takes the key. A bearer token has no key.
   const Doubt *const doubt = given->GetConfirmationMethod() == SamlToken::BEARER ? &EXCHANGE_OF_BEARER_TOKEN : nullptr;
   return AskForToken([&] { return call.service.AcquireTokenByToken(*given, call.spec); }, doubt, call.output);

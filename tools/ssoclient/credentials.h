@@ -37,7 +37,7 @@ struct AcquireCall {
   const CredentialsOptions &credentials;
   const std::string &url; ///< of the service
   const Tarvel::Crypto::CertificateList &trusted;
-  std::int64_t toleranceSec;
+  const VerifyOptions &verifyOptions;
   const OutputOptions &output;
 };
 

@@ -58,6 +58,10 @@ constexpr Command COMMANDS[] = {
      "  ssoclient doctor --sts https://sts.corp.example/sts --ca ca.pem --trust sts.pem\n"
      "  ssoclient doctor --sts https://sts.corp.example/sts --ca ca.pem --timeout 5 --format json\n",
      DefineDoctor},
+    {"dialect", "List the dialects of services that are known, or write one as a file that can be edited",
+     "  ssoclient dialect\n"
+     "  ssoclient dialect cxf\n",
+     DefineDialect},
 };
 
 /// The format that the command line asks for; works also for a command line that has errors.

@@ -35,7 +35,10 @@ std::string PrintableValue(std::string_view text) {
 }
 
 std::string ReadInput(const std::string &path, std::size_t limit) {
-  const InputDescriptor file(path);
+  return ReadInput(InputDescriptor(path), path, limit);
+}
+
+std::string ReadInput(const InputDescriptor &file, const std::string &name, std::size_t limit) {
   std::string content;
   std::array<char, 65536> buffer;
   while (content.size() < limit) {
@@ -44,7 +47,7 @@ std::string ReadInput(const std::string &path, std::size_t limit) {
       return content;
     }
     if (count < 0 && errno != EINTR) {
-      throw Tarvel::IOException(path + ": " + std::strerror(errno));
+      throw Tarvel::IOException(name + ": " + std::strerror(errno));
     }
     if (count > 0) {
       content.append(buffer.data(), static_cast<std::size_t>(count));

@@ -11,6 +11,8 @@
 
 namespace SsoClient::Tool {
 
+class InputDescriptor;
+
 enum class Format { TEXT, JSON, XML };
 
 /// The output options that all commands share.
@@ -26,6 +28,9 @@ std::string PrintableValue(std::string_view text);
 /// The octets of the file `path`, or of standard input when it is "-", at most `limit` of them.
 /// @throws Tarvel::IOException naming the path.
 std::string ReadInput(const std::string &path, std::size_t limit);
+
+/// The same for a file that is open. `name` is its name in messages.
+std::string ReadInput(const InputDescriptor &file, const std::string &name, std::size_t limit);
 
 /// Writes all of `text` to standard output.
 /// @throws Tarvel::IOException when it cannot be written in full.

@@ -19,7 +19,9 @@ namespace SsoClient::Tool {
 /// uses its sink. Main thread only.
 class RefusedToken {
 public:
-  RefusedToken(const TokenOutputOptions &options, const OutputOptions &output);
+  /// @param trusted the certificates, and `verifyOptions` the options, with which tokens are verified
+  RefusedToken(const TokenOutputOptions &options, const Tarvel::Crypto::CertificateList &trusted,
+               const VerifyOptions &verifyOptions, const OutputOptions &output);
   RefusedToken(const RefusedToken &) = delete;
   RefusedToken &operator=(const RefusedToken &) = delete;
 
@@ -48,7 +50,12 @@ public:
   }
 
 private:
+  /// Saves the token, and returns what the caller can do next.
+  std::string Save(const std::string &xml);
+
   const TokenOutputOptions &m_options;
+  const Tarvel::Crypto::CertificateList &m_trusted;
+  const VerifyOptions &m_verifyOptions;
   const OutputOptions &m_output;
   std::string m_hint; ///< empty: no token was refused
 };

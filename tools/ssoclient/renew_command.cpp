@@ -4,6 +4,7 @@
 
 #include "command.h"
 #include "connection.h"
+#include "dialect_options.h"
 #include "identity.h"
 #include "operation_events.h"
 #include "refused_token.h"
@@ -20,6 +21,7 @@ namespace {
 
 struct RenewOptions {
   ConnectionOptions connection;
+  DialectOptions dialect;
   TrustOptions trust;
   IdentityOptions identity;
   std::string lifetime = DEFAULT_LIFETIME;
@@ -37,20 +39,25 @@ ExitCode Renew(const RenewOptions &options, const OutputOptions &output) {
   claims.ClaimFile(options.file, "FILE");
   CheckIdentity(options.identity, claims);
   CheckConnection(options.connection);
+  ServiceOptions serviceOptions;
+  serviceOptions.dialect = ToDialect(options.dialect);
   CheckTokenOutput(options.tokenOutput, output);
 
   const Tarvel::Crypto::CertificateList trusted = LoadTrusted(options.trust, output);
-  const auto given = ReadToken(options.file, trusted, options.trust.toleranceSec);
-  RefusedToken refused(options.tokenOutput, output);
-  const auto service = CreateService(options.connection, trusted, LoadIdentity(options.identity),
-                                     {{}, ObserverFor(output), refused.GetSink()});
+  const VerifyOptions verifyOptions = VerifyOptionsOf(options.trust);
+  const auto given = ReadToken(options.file, trusted, verifyOptions);
+  RefusedToken refused(options.tokenOutput, trusted, verifyOptions, output);
+  serviceOptions.verifyOptions.profile = verifyOptions.profile; // the tolerance is checked below
+  serviceOptions.observer = ObserverFor(output);
+  serviceOptions.refusedTokenSink = refused.GetSink();
+  const auto service = CreateService(options.connection, trusted, LoadIdentity(options.identity), serviceOptions);
   const IssuedToken issued = refused.Explain([&] {
     IssuedToken renewed =
         AskForToken([&] { return service->RenewToken(*given, spec.tokenLifetimeSec); }, nullptr, output);
-    RequireWithinTolerance(*renewed.token, trusted, options.trust.toleranceSec, refused.GetSink());
+    RequireWithinTolerance(*renewed.token, trusted, verifyOptions, refused.GetSink());
     return renewed;
   });
-  WriteToken(issued, spec, options.trust.toleranceSec, options.tokenOutput, output);
+  WriteToken(issued, spec, serviceOptions.dialect, options.trust.toleranceSec, options.tokenOutput, output);
   return ExitCode::DONE;
 }
 
@@ -59,6 +66,7 @@ ExitCode Renew(const RenewOptions &options, const OutputOptions &output) {
 Action DefineRenew(CLI::App &app, const OutputOptions &output) {
   const auto options = std::make_shared<RenewOptions>();
   AddConnectionOptions(app, options->connection);
+  AddDialectOptions(app, options->dialect);
   AddIdentityOptions(app, options->identity);
   AddLifetimeOption(app, options->lifetime);
   AddTrustOptions(app, options->trust);

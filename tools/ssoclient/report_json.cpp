@@ -2,6 +2,7 @@
 /// @file
 /// The JSON of a report.
 
+#include "json_array.h"
 #include "report_view.h"
 #include "time_text.h"
 
@@ -89,15 +90,6 @@ Json ClaimsJson(const UnverifiedClaims &claims) {
           {"confirmationMethod", OrNull(claims.confirmationMethod)}};
 }
 
-template <typename Items, typename ToJson>
-Json ArrayOf(const Items &items, const ToJson &toJson) {
-  Json array = Json::array();
-  for (const auto &item : items) {
-    array.push_back(toJson(item));
-  }
-  return array;
-}
-
 } // namespace
 
 nlohmann::ordered_json ReportJson(const ReportView &view) {
@@ -105,14 +97,14 @@ nlohmann::ordered_json ReportJson(const ReportView &view) {
   return {{"accepted", view.usesTrust ? Json(report.accepted) : Json(nullptr)},
           {"refusal", OrNull(report.refusal)},
           {"checkedAt", UtcText(report.checkedAt)},
-          {"checks", ArrayOf(report.checks, CheckJson)},
+          {"checks", JsonArrayOf(report.checks, CheckJson)},
           {"algorithm", OrNull(report.signatureAlgorithm)},
           {"canonicalization", OrNull(report.canonicalization)},
-          {"references", ArrayOf(report.references, ReferenceJson)},
-          {"keys", ArrayOf(report.trustedKeys, KeyJson)},
+          {"references", JsonArrayOf(report.references, ReferenceJson)},
+          {"keys", JsonArrayOf(report.trustedKeys, KeyJson)},
           {"namedCertificates",
-           ArrayOf(report.namedCertificates,
-                   [&](const auto &certificate) { return NamedCertificateJson(certificate, view.usesTrust); })},
+           JsonArrayOf(report.namedCertificates,
+                       [&](const auto &certificate) { return NamedCertificateJson(certificate, view.usesTrust); })},
           {"claims", ClaimsJson(report.claims)}};
 }
 

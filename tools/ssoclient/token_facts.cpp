@@ -22,6 +22,7 @@ TokenFacts FactsOf(const SamlToken &token) {
   if (const Tarvel::Crypto::Certificate *const certificate = token.GetConfirmationCertificate()) {
     facts.certificate = CertificateFacts{certificate->GetSubject(), certificate->GetSha256Thumbprint()};
   }
+  facts.details = GetTokenDetails(token);
   return facts;
 }
 
@@ -43,6 +44,7 @@ TokenFacts FactsOf(const UnverifiedClaims &claims) {
   if (!claims.certificateThumbprint.empty()) {
     facts.certificate = CertificateFacts{claims.certificateSubject, claims.certificateThumbprint};
   }
+  facts.details = claims.details;
   return facts;
 }
 

@@ -8,6 +8,7 @@
 #include <ssoclient/delegate.h>
 #include <ssoclient/principal_id.h>
 #include <ssoclient/saml_token.h>
+#include <ssoclient/token_details.h>
 #include <ssoclient/token_report.h>
 #include <tarvel/system/date_time.h>
 
@@ -46,6 +47,8 @@ struct TokenFacts {
   boost::optional<bool> renewable;
   boost::optional<bool> delegable;
   boost::optional<bool> solution;
+
+  boost::optional<TokenDetails> details;
 };
 
 /// The facts of a verified token.

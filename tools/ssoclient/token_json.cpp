@@ -2,6 +2,8 @@
 /// @file
 /// The JSON of a token.
 
+#include "details_view.h"
+#include "json_array.h"
 #include "time_text.h"
 #include "token_view.h"
 
@@ -64,16 +66,12 @@ Json OrNull(const boost::optional<Value> &value) {
 
 template <typename Items>
 Json ArrayOf(const Items &items) {
-  Json array = Json::array();
-  for (const auto &item : items) {
-    array.push_back(ToJson(item));
-  }
-  return array;
+  return JsonArrayOf(items, [](const auto &item) { return ToJson(item); });
 }
 
-/// All keys are in this place, because callers rely on the keys and their order: a change to either needs a new
-/// "schema".
-Json FactsJson(const TokenFacts &facts) {
+/// These keys and those of `AddDetails` are in one place each, because callers rely on the keys and their order: a change
+/// to either needs a new "schema".
+Json BasicFactsJson(const TokenFacts &facts) {
   return {{"id", OrNull(facts.id)},
           {"subject", OrNull(facts.subject)},
           {"confirmation", OrNull(facts.confirmation)},
@@ -88,6 +86,12 @@ Json FactsJson(const TokenFacts &facts) {
           {"audience", ArrayOf(facts.audience)},
           {"advice", ArrayOf(facts.advice)},
           {"certificate", OrNull(facts.certificate)}};
+}
+
+Json FactsJson(const TokenFacts &facts) {
+  Json json = BasicFactsJson(facts);
+  AddDetails(facts.details, json);
+  return json;
 }
 
 /// `facts` with null for every value.

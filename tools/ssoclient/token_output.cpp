@@ -59,10 +59,10 @@ void CheckTokenOutput(const TokenOutputOptions &options, const OutputOptions &ou
   }
 }
 
-void WriteToken(const IssuedToken &issued, const TokenSpec &spec, std::int64_t toleranceSec,
-                const TokenOutputOptions &options, const OutputOptions &output) {
+void WriteToken(const IssuedToken &issued, const TokenSpec &spec, const ServiceDialect &dialect,
+                std::int64_t toleranceSec, const TokenOutputOptions &options, const OutputOptions &output) {
   TokenView view = ViewOf(*issued.token);
-  view.unmet = FindUnmet(spec, issued.askedAt, *view.facts, toleranceSec);
+  view.unmet = FindUnmet(spec, dialect, issued.askedAt, *view.facts, toleranceSec);
   for (const UnmetRequest &request : *view.unmet) {
     Warn("asked for, but not given by the service: " + request.wanted);
   }

@@ -2,6 +2,7 @@
 /// @file
 /// The text of a token, for people.
 
+#include "details_view.h"
 #include "labelled_lines.h"
 #include "time_text.h"
 #include "token_view.h"
@@ -61,11 +62,17 @@ void AddFacts(const TokenFacts &facts, const Tarvel::System::DateTime &now, Labe
     lines.AddUnlessEmpty("Last name:", facts.fullName->second);
   }
   lines.Add("Confirmation:", facts.confirmation ? ConfirmationText(*facts.confirmation) : UNKNOWN);
+  if (facts.details) {
+    AddConfirmationLines(*facts.details, lines);
+  }
   AddTimesAndFlags(facts, now, lines);
   AddLists(facts, lines);
   if (facts.certificate) {
     lines.Add("Certificate:", facts.certificate->subject);
     lines.Add("", "SHA-256 " + facts.certificate->sha256);
+  }
+  if (facts.details) {
+    AddDetailLines(*facts.details, now, lines);
   }
 }
 

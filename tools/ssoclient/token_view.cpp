@@ -19,8 +19,10 @@ TokenView ViewOf(const SamlToken &token) {
   return view;
 }
 
-TokenView InspectToken(std::string xml) {
-  const TokenVerifier verifier({});
+TokenView InspectToken(std::string xml, TokenProfile profile) {
+  VerifyOptions options;
+  options.profile = profile;
+  const TokenVerifier verifier({}, options);
   TokenReport report = verifier.Explain(xml);
   if (!report.claims.isAssertion) {
     verifier.Verify(xml); // throws the exception that the report quotes

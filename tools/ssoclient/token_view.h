@@ -10,6 +10,7 @@
 #include "unmet_request.h"
 
 #include <ssoclient/saml_token.h>
+#include <ssoclient/verify_options.h>
 #include <tarvel/system/date_time.h>
 
 #include <boost/optional.hpp>
@@ -35,11 +36,11 @@ struct TokenView {
 /// The view of a verified token.
 TokenView ViewOf(const SamlToken &token);
 
-/// The view of the first assertion in `xml`, with a report of how `xml` deviates from the accepted form. Nothing in it
-/// is verified.
+/// The view of the first assertion in `xml`, with a report of how `xml` deviates from the form of `profile`. Nothing in
+/// it is verified.
 /// @throws Tarvel::Xml::XMLParseException when `xml` is not a well-formed document.
 /// @throws ParseException when there is no assertion in it.
-TokenView InspectToken(std::string xml);
+TokenView InspectToken(std::string xml, TokenProfile profile = TokenProfile::STRICT);
 
 /// "bearer" or "holder-of-key".
 std::string_view ConfirmationText(SamlToken::ConfirmationType confirmation) noexcept;

@@ -6,12 +6,14 @@
 #include "option.h"
 
 #include <ssoclient/exceptions.h>
+#include <ssoclient/token_verifier.h>
 #include <tarvel/system/date_time.h>
 #include <tarvel/xml/parser.h>
 
 namespace SsoClient::Tool {
 namespace {
 
+constexpr const char *HINT_SEPARATOR = "; ";
 constexpr const char *EXPLAIN_HINT = "ssoclient verify --explain shows each check of the token, and what to do";
 
 void WarnOfDates(const Tarvel::Crypto::CertificateList &trusted, const OutputOptions &output) {
@@ -30,6 +32,13 @@ void WarnOfDates(const Tarvel::Crypto::CertificateList &trusted, const OutputOpt
   }
 }
 
+/// What to do about a token that is refused.
+std::string HintFor(const std::string &xml, const Tarvel::Crypto::CertificateList &trusted,
+                    const VerifyOptions &options) {
+  const std::string otherProfile = OtherProfileHint(xml, trusted, options);
+  return otherProfile.empty() ? EXPLAIN_HINT : otherProfile + HINT_SEPARATOR + EXPLAIN_HINT;
+}
+
 } // namespace
 
 void AddTrustOptions(CLI::App &app, TrustOptions &options) {
@@ -40,6 +49,14 @@ void AddTrustOptions(CLI::App &app, TrustOptions &options) {
   AddOption(app, "--tolerance", options.toleranceSec, "By how many seconds this machine's clock may be wrong")
       .ShowDefault()
       .TypeName("S");
+  AddProfileOption(app, options.profile);
+}
+
+VerifyOptions VerifyOptionsOf(const TrustOptions &options) {
+  VerifyOptions verifyOptions;
+  verifyOptions.clockToleranceSec = options.toleranceSec;
+  verifyOptions.profile = ProfileOf(options.profile);
+  return verifyOptions;
 }
 
 void AddTokenArgument(CLI::App &app, std::string &file) {
@@ -61,31 +78,25 @@ std::string ReadTokenText(const std::string &file) {
   return ReadInput(file, Tarvel::Xml::MAX_DOCUMENT_BYTES + 1);
 }
 
-std::shared_ptr<const SamlToken> ReadToken(const std::string &file, const TokenVerifier &verifier) {
+std::shared_ptr<const SamlToken> ReadToken(const std::string &file, const Tarvel::Crypto::CertificateList &trusted,
+                                           const VerifyOptions &options) {
   const std::string xml = ReadTokenText(file);
   try {
-    return verifier.Verify(xml);
+    return TokenVerifier(trusted, options).Verify(xml);
   } catch (const InvalidTokenException &refusal) {
-    throw HintedException(refusal, EXPLAIN_HINT);
+    throw HintedException(refusal, HintFor(xml, trusted, options));
   } catch (const Tarvel::Xml::XMLParseException &refusal) {
-    throw HintedException(refusal, EXPLAIN_HINT);
+    throw HintedException(refusal, HintFor(xml, trusted, options));
   }
-}
-
-std::shared_ptr<const SamlToken> ReadToken(const std::string &file, const Tarvel::Crypto::CertificateList &trusted,
-                                           std::int64_t toleranceSec) {
-  VerifyOptions options;
-  options.clockToleranceSec = toleranceSec;
-  return ReadToken(file, TokenVerifier(trusted, options));
 }
 
 void RequireWithinTolerance(const SamlToken &token, const Tarvel::Crypto::CertificateList &trusted,
-                            std::int64_t toleranceSec, const ServiceOptions::RefusedTokenSink &sink) {
-  if (toleranceSec >= DEFAULT_CLOCK_TOLERANCE_SEC) {
+                            const VerifyOptions &options, const ServiceOptions::RefusedTokenSink &sink) {
+  if (options.clockToleranceSec >= DEFAULT_CLOCK_TOLERANCE_SEC) {
     return;
   }
   try {
-    CreateSamlToken(token.ToXml(), trusted, toleranceSec);
+    TokenVerifier(trusted, options).Verify(token.ToXml());
   } catch (const InvalidTokenException &) {
     sink(token.ToXml());
     throw;

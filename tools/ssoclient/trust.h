@@ -5,11 +5,10 @@
 #pragma once
 
 #include "output.h"
+#include "profile.h"
 
-#include <ssoclient/create_saml_token.h>
 #include <ssoclient/saml_token.h>
 #include <ssoclient/service_options.h>
-#include <ssoclient/token_verifier.h>
 #include <tarvel/crypto/certificate.h>
 
 #include <cstdint>
@@ -26,9 +25,13 @@ namespace SsoClient::Tool {
 struct TrustOptions {
   std::vector<std::string> files;
   std::int64_t toleranceSec = DEFAULT_CLOCK_TOLERANCE_SEC;
+  std::string profile;
 };
 
 void AddTrustOptions(CLI::App &app, TrustOptions &options);
+
+/// Tolerance and profile of `options`.
+VerifyOptions VerifyOptionsOf(const TrustOptions &options);
 
 /// Adds the argument FILE, a token.
 void AddTokenArgument(CLI::App &app, std::string &file);
@@ -45,17 +48,14 @@ std::string ReadTokenText(const std::string &file);
 /// The token in `file`, verified.
 /// @throws Tarvel::IOException
 /// @throws HintedException for a token that is refused: the exception of `TokenVerifier::Verify`, with a hint.
-std::shared_ptr<const SamlToken> ReadToken(const std::string &file, const TokenVerifier &verifier);
-
-/// The same, with a clock tolerance as the only demand.
 std::shared_ptr<const SamlToken> ReadToken(const std::string &file, const Tarvel::Crypto::CertificateList &trusted,
-                                           std::int64_t toleranceSec);
+                                           const VerifyOptions &options);
 
-/// Checks again, with `toleranceSec`, a token that the library has accepted with `DEFAULT_CLOCK_TOLERANCE_SEC`; does
-/// nothing unless `toleranceSec` is less.
+/// Checks again, with the tolerance of `options`, a token that the library has accepted with
+/// `DEFAULT_CLOCK_TOLERANCE_SEC`; does nothing unless the tolerance is less.
 /// @param sink receives the text of a token that is refused
 /// @throws ParseException
 void RequireWithinTolerance(const SamlToken &token, const Tarvel::Crypto::CertificateList &trusted,
-                            std::int64_t toleranceSec, const ServiceOptions::RefusedTokenSink &sink);
+                            const VerifyOptions &options, const ServiceOptions::RefusedTokenSink &sink);
 
 } // namespace SsoClient::Tool

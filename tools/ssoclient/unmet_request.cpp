@@ -5,6 +5,7 @@
 #include <ssoclient/verify_options.h>
 
 #include <algorithm>
+#include <set>
 
 namespace SsoClient::Tool {
 namespace {
@@ -23,28 +24,58 @@ std::string Join(const Texts &texts) {
   return joined;
 }
 
-/// Whether `name` refers to `delegate`. A name without a domain matches that name in any domain.
-bool RefersTo(const std::string &name, const PrincipalId &delegate) {
+/// Whether the principal's name is the whole identifier, which the profile SAML2 does not split. Its domain then says
+/// only which kind of identifier it is.
+bool HasWholeName(const PrincipalId &principal) {
+  return principal.domain.find("nameid:") == 0;
+}
+
+std::string Show(const PrincipalId &principal) {
+  return HasWholeName(principal) ? principal.name : principal.name + "@" + principal.domain;
+}
+
+/// Whether `name` refers to `principal`. A name without a domain matches that name in any domain.
+bool RefersTo(const std::string &name, const PrincipalId &principal) {
   const std::size_t at = name.rfind('@');
-  if (at == std::string::npos) {
-    return PrincipalId{name, delegate.domain} == delegate;
+  if (at == std::string::npos || HasWholeName(principal)) {
+    return PrincipalId{name, principal.domain} == principal;
   }
-  return PrincipalId{name.substr(0, at), name.substr(at + 1)} == delegate;
+  return PrincipalId{name.substr(0, at), name.substr(at + 1)} == principal;
 }
 
 void CheckDelegation(const TokenSpec &spec, const TokenFacts &facts, std::vector<UnmetRequest> &unmet) {
-  if (!spec.delegateTo) {
-    return;
-  }
   std::string actual = "not delegated";
   if (!facts.delegationChain.empty()) {
     const PrincipalId &last = facts.delegationChain.back().subject;
     if (RefersTo(*spec.delegateTo, last)) {
       return;
     }
-    actual = "delegated to " + last.name + "@" + last.domain;
+    actual = "delegated to " + Show(last);
   }
   unmet.push_back({"delegation", "delegation to " + *spec.delegateTo + "; the token is " + actual});
+}
+
+void CheckSubject(const TokenSpec &spec, const TokenFacts &facts, std::vector<UnmetRequest> &unmet) {
+  if (facts.subject && RefersTo(*spec.delegateTo, *facts.subject)) {
+    return;
+  }
+  unmet.push_back({"delegation", "a token about " + *spec.delegateTo + "; the token is about " +
+                                     (facts.subject ? Show(*facts.subject) : "nobody")});
+}
+
+void CheckOtherParty(const TokenSpec &spec, const ServiceDialect &dialect, const TokenFacts &facts,
+                     std::vector<UnmetRequest> &unmet) {
+  if (!spec.delegateTo) {
+    return;
+  }
+  switch (dialect.delegation) {
+  case ServiceDialect::Delegation::DELEGATE_TO:
+    return CheckDelegation(spec, facts, unmet);
+  case ServiceDialect::Delegation::ON_BEHALF_OF:
+    return CheckSubject(spec, facts, unmet);
+  case ServiceDialect::Delegation::ACT_AS:
+    return;
+  }
 }
 
 bool HasAdvice(const std::vector<Advice> &all, const std::string &source, const std::string &name,
@@ -74,8 +105,15 @@ void CheckAdvice(const TokenSpec &spec, const TokenFacts &facts, std::vector<Unm
   }
 }
 
-void CheckAudience(const TokenSpec &spec, const TokenFacts &facts, std::vector<UnmetRequest> &unmet) {
-  if (!spec.audienceRestriction.empty() && facts.audience != spec.audienceRestriction) {
+/// A service may restrict a token to the address in `wsp:AppliesTo`, too, or take that address only as a hint.
+void CheckAudience(const TokenSpec &spec, const ServiceDialect &dialect, const TokenFacts &facts,
+                   std::vector<UnmetRequest> &unmet) {
+  std::set<std::string> withAddress = spec.audienceRestriction;
+  if (dialect.appliesTo) {
+    withAddress.insert(*dialect.appliesTo);
+  }
+  if (!spec.audienceRestriction.empty() && facts.audience != spec.audienceRestriction &&
+      facts.audience != withAddress) {
     unmet.push_back({"audience", "restriction to the audience " + Join(spec.audienceRestriction) + "; the token is " +
                                      (facts.audience.empty() ? "not restricted" : "for " + Join(facts.audience))});
   }
@@ -99,10 +137,11 @@ bool LastsLongEnough(std::int64_t lifetimeSec, const Tarvel::System::DateTime &a
 
 } // namespace
 
-std::vector<UnmetRequest> FindUnmet(const TokenSpec &spec, const Tarvel::System::DateTime &askedAt,
-                                    const TokenFacts &facts, std::int64_t toleranceSec) {
+std::vector<UnmetRequest> FindUnmet(const TokenSpec &spec, const ServiceDialect &dialect,
+                                    const Tarvel::System::DateTime &askedAt, const TokenFacts &facts,
+                                    std::int64_t toleranceSec) {
   std::vector<UnmetRequest> unmet;
-  CheckDelegation(spec, facts, unmet);
+  CheckOtherParty(spec, dialect, facts, unmet);
   if (spec.renewable && !facts.renewable.value_or(false)) {
     unmet.push_back({"renewable", "a renewable token"});
   }
@@ -110,7 +149,7 @@ std::vector<UnmetRequest> FindUnmet(const TokenSpec &spec, const Tarvel::System:
     unmet.push_back({"delegable", "a delegable token"});
   }
   CheckAdvice(spec, facts, unmet);
-  CheckAudience(spec, facts, unmet);
+  CheckAudience(spec, dialect, facts, unmet);
   if (!LastsLongEnough(spec.tokenLifetimeSec, askedAt, facts, toleranceSec)) {
     unmet.push_back({"lifetime", "a lifetime of " + std::to_string(spec.tokenLifetimeSec) +
                                      " seconds; the token ends at " +

@@ -6,6 +6,7 @@
 
 #include "token_facts.h"
 
+#include <ssoclient/service_dialect.h>
 #include <ssoclient/token_spec.h>
 #include <tarvel/system/date_time.h>
 
@@ -22,10 +23,14 @@ struct UnmetRequest {
 };
 
 /// What `spec` asks for and `facts` do not have, in the order of the keys above. An empty fact counts as missing.
+/// @param dialect in which it was asked. `wst:OnBehalfOf` asks for a token about the other party, without a delegation.
+///        `wst14:ActAs` is not checked: the standard does not say where a token names that party. The token may also be
+///        restricted to the address in `wsp:AppliesTo`.
 /// @param askedAt when the request was sent, by this machine's clock
 /// @param toleranceSec how far apart the clocks of this machine and of the service may be; limited to the range from 0
 ///        to `DEFAULT_CLOCK_TOLERANCE_SEC`
-std::vector<UnmetRequest> FindUnmet(const TokenSpec &spec, const Tarvel::System::DateTime &askedAt,
-                                    const TokenFacts &facts, std::int64_t toleranceSec);
+std::vector<UnmetRequest> FindUnmet(const TokenSpec &spec, const ServiceDialect &dialect,
+                                    const Tarvel::System::DateTime &askedAt, const TokenFacts &facts,
+                                    std::int64_t toleranceSec);
 
 } // namespace SsoClient::Tool

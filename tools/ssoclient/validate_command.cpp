@@ -4,6 +4,7 @@
 
 #include "command.h"
 #include "connection.h"
+#include "dialect_options.h"
 #include "operation_events.h"
 #include "service_call.h"
 #include "trust.h"
@@ -16,6 +17,7 @@ namespace {
 
 struct ValidateOptions {
   ConnectionOptions connection;
+  DialectOptions dialect;
   TrustOptions trust;
   std::string file;
 };
@@ -32,10 +34,13 @@ ExitCode Validate(const ValidateOptions &options, const OutputOptions &output) {
     throw UsageException("a verdict has no XML form; give --format text or json");
   }
   CheckConnection(options.connection);
+  ServiceOptions serviceOptions;
+  serviceOptions.dialect = ToDialect(options.dialect);
+  serviceOptions.observer = ObserverFor(output);
 
   const Tarvel::Crypto::CertificateList trusted = LoadTrusted(options.trust, output);
-  const auto token = ReadToken(options.file, trusted, options.trust.toleranceSec);
-  const auto service = CreateService(options.connection, trusted, boost::none, {{}, ObserverFor(output), {}});
+  const auto token = ReadToken(options.file, trusted, VerifyOptionsOf(options.trust));
+  const auto service = CreateService(options.connection, trusted, boost::none, serviceOptions);
   const bool isValid = CallService([&] { return service->ValidateSubject(*token); });
   WriteOutput(RenderVerdict(isValid, output.format));
   return isValid ? ExitCode::DONE : ExitCode::TOKEN_INVALID;
@@ -46,6 +51,7 @@ ExitCode Validate(const ValidateOptions &options, const OutputOptions &output) {
 Action DefineValidate(CLI::App &app, const OutputOptions &output) {
   const auto options = std::make_shared<ValidateOptions>();
   AddConnectionOptions(app, options->connection);
+  AddDialectOptions(app, options->dialect);
   AddTrustOptions(app, options->trust);
   AddTokenArgument(app, options->file);
   return [options, &output] { return Validate(*options, output); };

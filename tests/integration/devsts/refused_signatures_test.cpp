@@ -19,7 +19,8 @@ namespace DevStsTest {
 namespace {
 
 constexpr const char *WRONG_SIGNATURE = "the message's signature is wrong";
-constexpr const char *NOT_COVERED = "the signature must cover the body and the timestamp, and nothing else";
+constexpr const char *NOT_COVERED =
+    "the signature must cover the body and the timestamp, and nothing else but headers of WS-Addressing";
 
 class RefusedSignatures : public testing::Test {
 protected:

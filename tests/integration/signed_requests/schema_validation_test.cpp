@@ -14,8 +14,8 @@
 #include "integration/signed_requests/foreign_document.h"
 #include "integration/signed_requests/schemas.h"
 #include "support/data_file.h"
+#include "support/dialect_requests.h"
 #include "support/identity.h"
-#include "support/sample_requests.h"
 #include "support/token_stand_in.h"
 
 #include <gtest/gtest.h>
@@ -47,7 +47,7 @@ TEST_P(ValidRequest, ValidatesWithTheRealClockAndIdentifiers) {
   }
 }
 
-INSTANTIATE_TEST_SUITE_P(EveryRequest, ValidRequest, testing::ValuesIn(SampleRequests()),
+INSTANTIATE_TEST_SUITE_P(EveryRequest, ValidRequest, testing::ValuesIn(SampleRequestsInAllDialects()),
                          [](const auto &sample) { return TestName(sample.param); });
 
 TEST_F(ValidRequest, MayContainEveryKindOfIssuedToken) {

@@ -3,8 +3,8 @@
 #include "exchange/request_builder_impl.h"
 #include "integration/signed_requests/foreign_document.h"
 #include "support/data_file.h"
+#include "support/dialect_requests.h"
 #include "support/identity.h"
-#include "support/sample_requests.h"
 #include "support/token_stand_in.h"
 
 #include <tarvel/core/string_util.h>
@@ -19,7 +19,7 @@ using namespace Testing;
 /// All signed samples, and an exchange and a renewal of a genuine token.
 std::vector<SampleRequest> SignedRequests() {
   std::vector<SampleRequest> samples;
-  for (const SampleRequest &sample : SampleRequests()) {
+  for (const SampleRequest &sample : SampleRequestsInAllDialects()) {
     if (sample.isSigned) {
       samples.push_back(sample);
     }
@@ -58,6 +58,18 @@ protected:
     return std::string(der.begin(), der.end());
   }
 
+  /// The elements of WS-Addressing in the header.
+  static std::vector<xmlNodePtr> Addressing(const ForeignDocument &document) {
+    std::vector<xmlNodePtr> found;
+    const xmlNodePtr header = Child(document.Root(), "Header");
+    for (xmlNodePtr element = xmlFirstElementChild(header); element; element = xmlNextElementSibling(element)) {
+      if (reinterpret_cast<const char *>(element->ns->href) == std::string("http://www.w3.org/2005/08/addressing")) {
+        found.push_back(element);
+      }
+    }
+    return found;
+  }
+
   Request m_request;
 };
 
@@ -76,14 +88,18 @@ TEST_P(SignedEnvelope, DoesNotVerifyWithAnotherKey) {
   EXPECT_FALSE(IsValidSignature(MessageSignature(document), ReadDataFile("tokens/other.crt")));
 }
 
-TEST_P(SignedEnvelope, SignsTheWholeBodyAndTheTimestampAndNothingElse) {
+TEST_P(SignedEnvelope, SignsTheWholeBodyTheTimestampAndTheAddressingAndNothingElse) {
   const ForeignDocument document(m_request.body);
   std::vector<std::string> uris;
   for (const xmlNodePtr reference : FindAll(Child(MessageSignature(document), "SignedInfo"), "Reference")) {
     uris.push_back(AttributeOf(reference, "URI"));
   }
-  EXPECT_EQ(uris, (std::vector<std::string>{"#" + AttributeOf(Child(document.Root(), "Body"), "Id"),
-                                            "#" + AttributeOf(Find(document.Root(), "Timestamp"), "Id")}));
+  std::vector<std::string> expected = {"#" + AttributeOf(Child(document.Root(), "Body"), "Id"),
+                                       "#" + AttributeOf(Find(document.Root(), "Timestamp"), "Id")};
+  for (const xmlNodePtr element : Addressing(document)) {
+    expected.push_back("#" + AttributeOf(element, "Id"));
+  }
+  EXPECT_EQ(uris, expected);
 }
 
 /// One change to one element: its name, its attributes, its text, its children, its place.
@@ -140,10 +156,14 @@ const Change CHANGES[] = {
      }},
 };
 
-TEST_P(SignedEnvelope, FailsAfterAnyChangeToBodyOrTimestamp) {
+TEST_P(SignedEnvelope, FailsAfterAnyChangeToAnythingThatIsSigned) {
   const std::string certificate = NamedCertificate(ForeignDocument(m_request.body));
   std::size_t tried = 0;
-  for (const char *const part : {"Body", "Timestamp"}) {
+  std::vector<std::string> parts = {"Body", "Timestamp"};
+  for (const xmlNodePtr element : Addressing(ForeignDocument(m_request.body))) {
+    parts.emplace_back(reinterpret_cast<const char *>(element->name));
+  }
+  for (const std::string &part : parts) {
     const ForeignDocument original(m_request.body);
     const std::size_t count = Elements(Find(original.Root(), part)).size();
     for (std::size_t i = 0; i < count; ++i) {

@@ -15,6 +15,7 @@
 namespace ToolTest {
 namespace {
 
+using testing::EndsWith;
 using testing::HasSubstr;
 using testing::Not;
 using testing::StartsWith;
@@ -65,7 +66,8 @@ TEST_F(SaveRefused, KeepsATokenThatIsRefusedForItsForm) {
   for (const char *fault : {"expired-token", "unsigned-token", "unknown-element"}) {
     const Result result = Run(Line(fault) + "--force");
     EXPECT_EQ(8, result.exitCode) << fault;
-    EXPECT_THAT(result.err, HasSubstr("ssoclient: hint: " + SavedHint())) << fault;
+    EXPECT_THAT(result.err, HasSubstr("\nssoclient: hint: ")) << fault;
+    EXPECT_THAT(result.err, EndsWith(SavedHint() + "\n")) << fault;
     EXPECT_THAT(m_folder.Read("refused.xml"), HasSubstr("Assertion")) << fault;
     std::filesystem::remove(m_folder / "refused.xml");
   }

@@ -63,7 +63,7 @@ TEST_F(UnmetRequest, IsListedInJsonAndIsAlsoAWarningThere) {
                 Warning("a delegable token") + Warning("the advice audit:by=alice") +
                 Warning("restriction to the audience https://mail.corp.example/; the token is not restricted"),
             result.err);
-  EXPECT_THAT(result.out, EndsWith("  \"certificate\": null,\n  \"unmet\": [\n    \"delegation\",\n    \"renewable\",\n"
+  EXPECT_THAT(result.out, EndsWith("  ],\n  \"unmet\": [\n    \"delegation\",\n    \"renewable\",\n"
                                    "    \"delegable\",\n    \"advice\",\n    \"audience\"\n  ]\n}\n"));
 }
 
@@ -95,7 +95,7 @@ TEST_F(UnmetRequest, OfARenewalIsOnlyTheLifetime) {
   const std::string renew = "ssoclient renew --format json " + Service("plain-token") + IDENTITY;
   const Result whole = Run(renew + "token.xml");
   EXPECT_EQ(0, whole.exitCode);
-  EXPECT_THAT(whole.out, EndsWith("  },\n  \"unmet\": []\n}\n"));
+  EXPECT_THAT(whole.out, EndsWith("  ],\n  \"unmet\": []\n}\n"));
   const Result shorter =
       Run("ssoclient renew " + Service("short-lived-token") + IDENTITY + "--lifetime 20m --out renewed.xml token.xml");
   EXPECT_EQ(0, shorter.exitCode);

@@ -2,8 +2,8 @@
 // Compares every request byte for byte with its file in tests/data/requests. A change of the wire format is a difference in
 // these files. With SSOCLIENT_UPDATE_GOLDEN=1 the test writes them again and then fails, so that every change is noticed.
 #include "support/data_file.h"
+#include "support/dialect_requests.h"
 #include "support/fixed_environment.h"
-#include "support/sample_requests.h"
 #include "support/wire_layout.h"
 
 #include <gtest/gtest.h>
@@ -35,7 +35,7 @@ TEST_P(GoldenRequest, EqualsItsFileByteForByte) {
   EXPECT_EQ(request.body, ToWire(golden));
 }
 
-INSTANTIATE_TEST_SUITE_P(EveryOperation, GoldenRequest, testing::ValuesIn(SampleRequests()),
+INSTANTIATE_TEST_SUITE_P(EveryOperation, GoldenRequest, testing::ValuesIn(SampleRequestsInAllDialects()),
                          [](const auto &sample) { return TestName(sample.param); });
 
 } // namespace

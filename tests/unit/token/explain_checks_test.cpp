@@ -88,10 +88,10 @@ TEST_F(ExplainChecks, FormFailsAlone) {
   EXPECT_EQ("saml:OneTimeUse", finding.element);
   EXPECT_EQ("/saml:Assertion/saml:Conditions/saml:OneTimeUse", finding.path);
   EXPECT_EQ(
-      "Ask the service's operator to issue tokens of the accepted form, and make sure that nothing changes them on "
-      "their way.",
+      "Verify the token with the profile SAML2, which reads it, or ask the service's operator to issue tokens of the "
+      "accepted form.",
       finding.remedy);
-  EXPECT_EQ("Deviations from the accepted form: 1.", report.Get(Check::FORM).summary);
+  EXPECT_EQ("Deviations from the accepted form: 1. The profile SAML2 reads it.", report.Get(Check::FORM).summary);
 }
 
 TEST_F(ExplainChecks, IdentifiersFailAlone) {

@@ -100,7 +100,9 @@ TEST_F(ExplainClaims, ThousandsOfDeviationsDoNotHideOtherChecks) {
   const TokenReport::CheckResult &form = report.Get(TokenReport::Check::FORM);
   EXPECT_EQ(988u, form.findings.size());
   EXPECT_EQ(5000u - 988u, form.unlistedFindings);
-  EXPECT_EQ("Deviations from the accepted form: 5000.", form.summary);
+  EXPECT_EQ("Deviations from the accepted form: 5000. The profile SAML2 does not read it either: Unexpected content of "
+            "element 'saml:Conditions': element x.",
+            form.summary);
   EXPECT_EQ("/saml:Assertion/saml:Conditions/x[988]", form.findings.back().path);
   EXPECT_EQ("form failed, validity failed, digests failed", NotPassed(report));
   EXPECT_EQ(1u, report.Get(TokenReport::Check::VALIDITY).findings.size());

@@ -93,12 +93,15 @@ TEST(TokenJson, HasNullForWhatIsNotKnown) {
   const ordered_json json = ordered_json::parse(TokenJson(ViewWith(facts, Foreign())));
   EXPECT_THAT(KeysOf(json), ElementsAre("schema", "verified", "id", "subject", "confirmation", "notBefore",
                                         "notOnOrAfter", "renewable", "delegable", "solution", "fullName", "groups",
-                                        "delegation", "audience", "advice", "certificate", "report"));
+                                        "delegation", "audience", "advice", "certificate", "nameId", "issuer",
+                                        "issueInstant", "confirmations", "audienceRestrictions", "oneTimeUse",
+                                        "proxyRestriction", "authnStatements", "attributes", "report"));
   EXPECT_EQ(1, json["schema"]);
   EXPECT_EQ(false, json["verified"]);
   EXPECT_EQ("_1", json["id"]);
   for (const char *key : {"subject", "confirmation", "notBefore", "notOnOrAfter", "renewable", "delegable", "solution",
-                          "fullName", "certificate"}) {
+                          "fullName", "certificate", "nameId", "issuer", "issueInstant", "confirmations",
+                          "audienceRestrictions", "oneTimeUse", "proxyRestriction", "authnStatements", "attributes"}) {
     EXPECT_TRUE(json[key].is_null()) << key;
   }
   for (const char *key : {"groups", "delegation", "audience", "advice"}) {
@@ -114,7 +117,7 @@ TEST(TokenJson, OfARefusedTokenHasNothingThatTheTokenStates) {
     const bool isAboutTheCheck = item.key() == "schema" || item.key() == "verified" || item.key() == "report";
     EXPECT_NE(isAboutTheCheck, item.value().is_null()) << item.key();
   }
-  EXPECT_EQ(17u, json.size());
+  EXPECT_EQ(26u, json.size());
 }
 
 TEST(ReportJson, HasEachPartOfTheReport) {

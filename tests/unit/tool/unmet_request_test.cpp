@@ -41,9 +41,9 @@ std::vector<std::string> KeysOf(const std::vector<UnmetRequest> &unmet) {
 }
 
 /// The unmet requests as text, for a token with these facts.
-std::vector<std::string> WantedOf(const TokenSpec &spec, const TokenFacts &facts) {
+std::vector<std::string> WantedOf(const TokenSpec &spec, const TokenFacts &facts, const ServiceDialect &dialect = {}) {
   std::vector<std::string> wanted;
-  for (const UnmetRequest &request : FindUnmet(spec, ASKED_AT, facts, 0)) {
+  for (const UnmetRequest &request : FindUnmet(spec, dialect, ASKED_AT, facts, 0)) {
     wanted.push_back(request.wanted);
   }
   return wanted;
@@ -60,7 +60,7 @@ TokenSpec SpecWithEverything() {
 }
 
 TEST(FindUnmet, ListsEverythingThatIsMissingInAFixedOrder) {
-  EXPECT_THAT(KeysOf(FindUnmet(SpecWithEverything(), ASKED_AT, HourFrom(), 0)),
+  EXPECT_THAT(KeysOf(FindUnmet(SpecWithEverything(), ServiceDialect(), ASKED_AT, HourFrom(), 0)),
               ElementsAre("delegation", "renewable", "delegable", "advice", "audience", "lifetime"));
   EXPECT_THAT(WantedOf(SpecWithEverything(), HourFrom()),
               ElementsAre("delegation to bob@corp.example; the token is not delegated", "a renewable token",
@@ -76,7 +76,7 @@ TEST(FindUnmet, ListsNothingWhenNothingIsMissing) {
   facts.delegable = true;
   facts.advice = {{"audit", {{"by", {"alice"}}}}};
   facts.audience = {"https://mail.corp.example/"};
-  EXPECT_THAT(FindUnmet(SpecWithEverything(), ASKED_AT, facts, 0), IsEmpty());
+  EXPECT_THAT(FindUnmet(SpecWithEverything(), ServiceDialect(), ASKED_AT, facts, 0), IsEmpty());
 }
 
 TEST(FindUnmet, ListsWhatTheTokenDoesNotState) {
@@ -93,7 +93,7 @@ TEST(FindUnmet, AcceptsATokenWithMoreThanWasAskedFor) {
   facts.delegable = true;
   facts.advice = {{"audit", {{"by", {"alice"}}}}};
   facts.audience = {"https://mail.corp.example/"};
-  EXPECT_THAT(FindUnmet(SpecFor(3600), ASKED_AT, facts, 0), IsEmpty());
+  EXPECT_THAT(FindUnmet(SpecFor(3600), ServiceDialect(), ASKED_AT, facts, 0), IsEmpty());
 }
 
 TEST(FindUnmet, ComparesTheLastDelegateWithoutLetterCase) {
@@ -142,6 +142,75 @@ TEST(FindUnmet, RequiresExactlyTheAudienceThatWasAskedFor) {
   EXPECT_THAT(WantedOf(spec, facts), ElementsAre("restriction to the audience a, b; the token is for a, b, c"));
 }
 
+TEST(FindUnmet, WantsATokenAboutTheOtherPartyAndNoDelegationOnBehalfOfThatParty) {
+  ServiceDialect dialect;
+  dialect.delegation = ServiceDialect::Delegation::ON_BEHALF_OF;
+  TokenSpec spec = SpecFor(3600);
+  spec.delegateTo = "bob@corp.example";
+  TokenFacts facts = HourFrom();
+  facts.subject = PrincipalId{"Bob", "corp.example"};
+  EXPECT_THAT(WantedOf(spec, facts, dialect), IsEmpty());
+  facts.subject = PrincipalId{"alice", "corp.example"};
+  facts.delegationChain = {{{"bob", "corp.example"}, DateTime()}};
+  EXPECT_THAT(WantedOf(spec, facts, dialect),
+              ElementsAre("a token about bob@corp.example; the token is about alice@corp.example"));
+  EXPECT_THAT(KeysOf(FindUnmet(spec, dialect, ASKED_AT, facts, 0)), ElementsAre("delegation"));
+  facts.subject = boost::none;
+  EXPECT_THAT(WantedOf(spec, facts, dialect), ElementsAre("a token about bob@corp.example; the token is about nobody"));
+  spec.delegateTo = boost::none;
+  EXPECT_THAT(WantedOf(spec, facts, dialect), IsEmpty());
+}
+
+TEST(FindUnmet, ComparesTheWholeNameOfAnIdentifierThatIsNotSplit) {
+  ServiceDialect dialect;
+  dialect.delegation = ServiceDialect::Delegation::ON_BEHALF_OF;
+  TokenSpec spec = SpecFor(3600);
+  spec.delegateTo = "bob@corp.example";
+  TokenFacts facts = HourFrom();
+  facts.subject = PrincipalId{"bob@corp.example", "nameid:unspecified"};
+  EXPECT_THAT(WantedOf(spec, facts, dialect), IsEmpty());
+  facts.subject = PrincipalId{"bob", "nameid:unspecified"};
+  EXPECT_THAT(WantedOf(spec, facts, dialect), ElementsAre("a token about bob@corp.example; the token is about bob"));
+  spec.delegateTo = "bob";
+  EXPECT_THAT(WantedOf(spec, facts, dialect), IsEmpty());
+  spec.delegateTo = "bob@nameid:unspecified";
+  EXPECT_THAT(WantedOf(spec, facts, dialect),
+              ElementsAre("a token about bob@nameid:unspecified; the token is about bob"));
+  // Without such a domain, the last at-sign separates the domain.
+  spec.delegateTo = "a@b";
+  facts.subject = PrincipalId{"a@b", "corp.example"};
+  EXPECT_THAT(WantedOf(spec, facts, dialect), ElementsAre("a token about a@b; the token is about a@b@corp.example"));
+}
+
+TEST(FindUnmet, DoesNotCheckWhereATokenNamesThePartyAsWhichToAct) {
+  ServiceDialect dialect;
+  dialect.delegation = ServiceDialect::Delegation::ACT_AS;
+  TokenSpec spec = SpecFor(3600);
+  spec.delegateTo = "bob@corp.example";
+  EXPECT_THAT(WantedOf(spec, HourFrom(), dialect), IsEmpty());
+}
+
+TEST(FindUnmet, AcceptsARestrictionThatAlsoHasTheAddressThatTheTokenAppliesTo) {
+  ServiceDialect dialect;
+  dialect.appliesTo = "urn:c";
+  TokenSpec spec = SpecFor(3600);
+  TokenFacts facts = HourFrom();
+  facts.audience = {"urn:c"};
+  EXPECT_THAT(WantedOf(spec, facts, dialect), IsEmpty());
+  facts.audience = {};
+  EXPECT_THAT(WantedOf(spec, facts, dialect), IsEmpty());
+  spec.audienceRestriction = {"urn:a"};
+  facts.audience = {"urn:a"};
+  EXPECT_THAT(WantedOf(spec, facts, dialect), IsEmpty());
+  facts.audience = {"urn:a", "urn:c"};
+  EXPECT_THAT(WantedOf(spec, facts, dialect), IsEmpty());
+  facts.audience = {"urn:c"};
+  EXPECT_THAT(WantedOf(spec, facts, dialect), ElementsAre("restriction to the audience urn:a; the token is for urn:c"));
+  facts.audience = {"urn:a", "urn:b"};
+  EXPECT_THAT(WantedOf(spec, facts, dialect),
+              ElementsAre("restriction to the audience urn:a; the token is for urn:a, urn:b"));
+}
+
 struct Life {
   const char *name;
   const char *start;
@@ -171,7 +240,8 @@ class FindUnmetLifetime : public testing::TestWithParam<Life> {};
 
 TEST_P(FindUnmetLifetime, IsMetWhenItIsNotClearlyShorter) {
   const Life &life = GetParam();
-  const auto unmet = FindUnmet(SpecFor(3600), ASKED_AT, HourFrom(life.start, life.end), life.toleranceSec);
+  const auto unmet =
+      FindUnmet(SpecFor(3600), ServiceDialect(), ASKED_AT, HourFrom(life.start, life.end), life.toleranceSec);
   EXPECT_EQ(life.isMet, unmet.empty());
   EXPECT_EQ(life.isMet ? 0u : 1u, unmet.size());
 }
@@ -181,7 +251,7 @@ INSTANTIATE_TEST_SUITE_P(Of, FindUnmetLifetime, testing::ValuesIn(LIVES),
 
 TEST(FindUnmet, DoesNotOverflowAtTheLimitsOfDates) {
   const TokenFacts facts = HourFrom("0001-01-01T00:00:00Z", "9999-12-31T23:59:59Z");
-  EXPECT_THAT(FindUnmet(SpecFor(100LL * 366 * 86400), ASKED_AT, facts, 600), IsEmpty());
+  EXPECT_THAT(FindUnmet(SpecFor(100LL * 366 * 86400), ServiceDialect(), ASKED_AT, facts, 600), IsEmpty());
 }
 
 } // namespace

@@ -1,0 +1,38 @@
+// SPDX-License-Identifier: Apache-2.0
+/// @file
+/// What a report says about the profile for which it was not made.
+
+#pragma once
+
+#include <ssoclient/exceptions.h>
+
+#include <string>
+
+namespace SsoClient {
+
+/// Why `rule`, which reports to `ThrowingSink`, refuses the token. Empty if it does not.
+template <typename Rule>
+std::string RefusalOf(const Rule &rule) {
+  try {
+    rule();
+    return {};
+  } catch (const ParseException &refusal) {
+    return refusal.what();
+  }
+}
+
+/// Whether the profile `profile` reads or accepts, too, what the profile of the report has examined.
+/// @param verb "read" or "accept"
+/// @param refusal why the other profile does not; empty if it does
+/// @param isRefused whether the profile of the report refuses it
+inline std::string OtherProfileSentence(const std::string &profile, const std::string &verb, const std::string &refusal,
+                                        bool isRefused) {
+  std::string text = "The profile " + profile;
+  if (refusal.empty()) {
+    return text + " " + verb + (isRefused ? "s it." : "s it, too.");
+  }
+  text += " does not " + verb + (isRefused ? " it either: " : " it: ") + refusal;
+  return text.back() == '.' ? text : text + ".";
+}
+
+} // namespace SsoClient

@@ -1,0 +1,27 @@
+// SPDX-License-Identifier: Apache-2.0
+/// @file
+/// Requests in dialects other than the default, under the names of their golden files.
+
+#pragma once
+
+#include "support/sample_requests.h"
+
+#include <ssoclient/service_dialect.h>
+
+#include <vector>
+
+namespace Testing {
+
+/// The service's address in the samples.
+extern const char *const SAMPLE_SERVICE;
+
+/// Everything that a dialect can change, at once.
+SsoClient::ServiceDialect FullDialect();
+
+/// At least one request for each switch.
+std::vector<SampleRequest> DialectRequests();
+
+/// The samples in the default dialect, then those in others.
+std::vector<SampleRequest> SampleRequestsInAllDialects();
+
+} // namespace Testing
