@@ -9,6 +9,7 @@
 #include <tarvel/core/string_util.h>
 
 #include <algorithm>
+#include <cstddef>
 #include <iterator>
 #include <string_view>
 #include <utility>
@@ -50,6 +51,9 @@ bool IsWrittenAsItIs(char octet) {
 
 void AppendEncoded(std::string &text, std::string_view value) {
   constexpr std::string_view DIGITS = "0123456789ABCDEF";
+  constexpr std::ptrdiff_t ENCODED = 2; // characters that an encoded octet has in addition
+  const auto encoded = std::count_if(value.begin(), value.end(), [](char octet) { return !IsWrittenAsItIs(octet); });
+  text.reserve(text.size() + value.size() + static_cast<std::size_t>(encoded * ENCODED)); // a long value is not copied
   for (const char octet : value) {
     if (IsWrittenAsItIs(octet)) {
       text += octet;
