@@ -33,8 +33,16 @@ std::vector<JudgedVerifier> MakeVerifiers() {
   demanding.acceptedAudiences = {"https://files.corp.example/"};
   demanding.acceptUnrestrictedAudience = false;
   demanding.requiredConfirmation = SsoClient::SamlToken::HOLDER_OF_KEY;
+  VerifyOptions saml2;
+  saml2.profile = SsoClient::TokenProfile::SAML2;
+  VerifyOptions demandingSaml2 = demanding;
+  demandingSaml2.profile = SsoClient::TokenProfile::SAML2;
+  demandingSaml2.acceptedRecipients = {"https://files.corp.example/consume"};
+  demandingSaml2.expectedInResponseTo = "_request-1";
+  demandingSaml2.senderAddress = "192.0.2.7";
   return {JudgedVerifier({Certificate("sts-rsa"), Certificate("sts-ec256")}, VerifyOptions()),
-          JudgedVerifier({Certificate("sts-rsa")}, demanding), JudgedVerifier({}, VerifyOptions())};
+          JudgedVerifier({Certificate("sts-rsa")}, demanding), JudgedVerifier({}, VerifyOptions()),
+          JudgedVerifier({Certificate("sts-rsa")}, saml2), JudgedVerifier({Certificate("sts-rsa")}, demandingSaml2)};
 }
 
 void Require(const Testing::Judgement &judgement) {
@@ -57,6 +65,7 @@ extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t *data, std::size_t size
     Tarvel::Ref<Tarvel::Xml::Document> document;
     SsoClient::ParseXML(xml, document);
     Require(Testing::JudgeElement(verifiers.front(), *document->GetDocumentElement()));
+    Require(Testing::JudgeElement(verifiers[3], *document->GetDocumentElement()));
   } catch (const Tarvel::Xml::XMLParseException &) {
   }
   return 0;

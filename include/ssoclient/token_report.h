@@ -55,7 +55,7 @@ struct UnverifiedClaims {
   std::string certificateThumbprint;
   /// Everything that the assertion states. Set if the profile SAML2 reads the assertion, whatever profile the report is for.
   /// `usedConfirmation` is the number of confirmations if none of them can be used. `attributes` is empty if
-  /// `GetAttributes` would throw.
+  /// `GetAttributes` would throw. The text of a value that contains a signature is empty: a report never repeats one.
   boost::optional<TokenDetails> details;
 };
 

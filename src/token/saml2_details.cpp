@@ -115,6 +115,17 @@ SamlAttribute ReadAttribute(const ElementNode &element, ValueReader &reader) {
   return attribute;
 }
 
+/// Empties the values with a signature. It could be that of a bearer token, which a report must not repeat.
+void RemoveSignatures(std::vector<SamlAttribute> &attributes) {
+  for (SamlAttribute &attribute : attributes) {
+    for (AttributeValue &value : attribute.values) {
+      if (value.isXml && value.text.find("SignatureValue") != std::string::npos) {
+        value.text.clear();
+      }
+    }
+  }
+}
+
 } // namespace
 
 NameId ReadNameId(const ElementNode &element) {
@@ -141,7 +152,9 @@ TokenDetails TakeDetails(Saml2Assertion &assertion) {
 
 TokenDetails TakeDetailsOfClaims(Saml2Assertion &assertion) {
   try {
-    return TakeDetails(assertion);
+    TokenDetails details = TakeDetails(assertion);
+    RemoveSignatures(details.attributes);
+    return details;
   } catch (const ParseException &) {
     return std::move(assertion.details);
   } catch (const Tarvel::Xml::Security::XmlSecurityException &) {

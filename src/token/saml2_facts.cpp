@@ -9,6 +9,7 @@
 #include <tarvel/core/string_util.h>
 
 #include <algorithm>
+#include <cstddef>
 #include <iterator>
 #include <string_view>
 #include <utility>

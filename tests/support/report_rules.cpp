@@ -12,6 +12,7 @@
 #include <cstdint>
 #include <set>
 #include <string_view>
+#include <vector>
 
 namespace Testing {
 
@@ -24,6 +25,8 @@ namespace {
 constexpr std::size_t CHECKS = 14;
 constexpr std::size_t MAX_REFERENCES = 10;
 constexpr std::size_t MAX_NAMED_CERTIFICATES = 16;
+constexpr const char *METHOD_BEARER = "urn:oasis:names:tc:SAML:2.0:cm:bearer";
+constexpr const char *METHOD_HOLDER_OF_KEY = "urn:oasis:names:tc:SAML:2.0:cm:holder-of-key";
 constexpr std::size_t LONGEST_TEXT = 1024 + 40; // with the note of how much was cut
 
 /// Collects what is wrong. Each rule is a function that is named after its promise.
@@ -239,9 +242,20 @@ std::string ClaimsLikeAToken(UnverifiedClaims claims) {
   return DescribeClaims(claims);
 }
 
+/// The details of a token, without signatures in attribute values, which a report does not repeat.
+TokenDetails DetailsOf(const SamlToken &token) {
+  TokenDetails details = GetTokenDetails(token);
+  for (SamlAttribute &attribute : details.attributes) {
+    for (AttributeValue &value : attribute.values) {
+      value.text = value.isXml && value.text.find("SignatureValue") != std::string::npos ? std::string() : value.text;
+    }
+  }
+  return details;
+}
+
 UnverifiedClaims ClaimsOf(const SamlToken &token) {
   UnverifiedClaims claims;
-  claims.details = GetTokenDetails(token);
+  claims.details = DetailsOf(token);
   claims.id = token.GetId();
   claims.subject = token.GetSubject();
   claims.startDate = token.GetStartDate();
@@ -273,20 +287,70 @@ void ExpectTheClaimsOfTheToken(const TokenReport &report, const Verification &ve
                "there are claims, but no assertion");
 }
 
+/// Whether one of several confirmations was chosen. The profile STRICT has only one, and uses it always.
+bool HasUsedConfirmation(const UnverifiedClaims &claims, const VerifyOptions &options) {
+  return options.profile == TokenProfile::STRICT ||
+         (claims.details && claims.details->usedConfirmation < claims.details->confirmations.size());
+}
+
+/// The audiences of each restriction. The profile STRICT allows only one.
+std::vector<std::set<std::string>> RestrictionsOf(const UnverifiedClaims &claims) {
+  if (claims.details) {
+    return claims.details->audienceRestrictions;
+  }
+  return claims.audience.empty() ? std::vector<std::set<std::string>>()
+                                 : std::vector<std::set<std::string>>{claims.audience};
+}
+
+bool IsAudienceAccepted(const std::vector<std::set<std::string>> &restrictions, const VerifyOptions &options) {
+  if (options.acceptedAudiences.empty() || (restrictions.empty() && options.acceptUnrestrictedAudience)) {
+    return true;
+  }
+  return !restrictions.empty() &&
+         std::all_of(restrictions.begin(), restrictions.end(), [&](const std::set<std::string> &audiences) {
+           return std::any_of(audiences.begin(), audiences.end(),
+                              [&](const auto &one) { return options.acceptedAudiences.count(one) != 0; });
+         });
+}
+
+/// The confirmation of an accepted token is one that the options allow.
+void ExpectAConfirmationThatFits(const TokenReport &report, const VerifyOptions &options, Contradictions &wrong) {
+  if (!report.accepted || !report.claims.details) {
+    return;
+  }
+  const TokenDetails &details = *report.claims.details;
+  wrong.Expect(details.usedConfirmation < details.confirmations.size(), "accepted without a confirmation");
+  if (details.usedConfirmation >= details.confirmations.size()) {
+    return;
+  }
+  const ConfirmationDetails &used = details.confirmations[details.usedConfirmation];
+  const bool isBearer = report.claims.confirmation == SamlToken::BEARER;
+  wrong.Expect(used.method == (isBearer ? METHOD_BEARER : METHOD_HOLDER_OF_KEY),
+               "another method is used: " + used.method);
+  wrong.Expect(isBearer == used.publicKey.empty(), "the key does not belong to the method");
+  wrong.Expect(options.acceptedRecipients.empty() ||
+                   (used.recipient ? options.acceptedRecipients.count(*used.recipient) != 0 : !isBearer),
+               "the recipient is not one of those accepted");
+  wrong.Expect(!options.expectedInResponseTo ||
+                   (used.inResponseTo ? *used.inResponseTo == *options.expectedInResponseTo : !isBearer),
+               "the token answers another request");
+  wrong.Expect(!options.senderAddress || !used.address || *used.address == *options.senderAddress,
+               "the token has another sender");
+}
+
 void ExpectTheOptionsToDecide(const TokenReport &report, const VerifyOptions &options, Contradictions &wrong) {
   if (!Passed(report, Check::FORM)) {
     return;
   }
-  const std::set<std::string> &audience = report.claims.audience;
-  const bool isAccepted = options.acceptedAudiences.empty() ||
-                          (audience.empty() && options.acceptUnrestrictedAudience) ||
-                          std::any_of(audience.begin(), audience.end(),
-                                      [&](const auto &one) { return options.acceptedAudiences.count(one); });
+  const bool isAccepted = IsAudienceAccepted(RestrictionsOf(report.claims), options);
   wrong.Expect(Passed(report, Check::AUDIENCE) == isAccepted, "AUDIENCE is not what the options say");
   wrong.Expect(Failed(report, Check::AUDIENCE) != isAccepted, "AUDIENCE is not done");
-  const bool isConfirmed = !options.requiredConfirmation || options.requiredConfirmation == report.claims.confirmation;
+  const bool isConfirmed =
+      HasUsedConfirmation(report.claims, options) &&
+      (!options.requiredConfirmation || options.requiredConfirmation == report.claims.confirmation);
   wrong.Expect(Passed(report, Check::REQUIRED_CONFIRMATION) == isConfirmed,
                "the confirmation is not what they require");
+  ExpectAConfirmationThatFits(report, options, wrong);
 }
 
 } // namespace

@@ -6,6 +6,7 @@
 
 #include <cstdint>
 #include <cstdlib>
+#include <cstring>
 
 namespace Testing {
 
@@ -26,6 +27,41 @@ struct Misses {
   std::int64_t start = 0;
   std::int64_t end = 0;
 };
+
+/// In the profile SAML2, dates of the conditions, of confirmations and of sessions count. Each message states its own.
+std::string JudgeSaml2Finding(const TokenReport::Finding &finding, std::int64_t now, std::int64_t tolerance) {
+  for (const char *const beginning :
+       {"Token start date is in the future: ", "The subject confirmation cannot be used before: ",
+        "The token has expired at: ", "The subject confirmation has expired at: ", "The session has ended at: "}) {
+    if (BeginsWith(finding.message, beginning)) {
+      Tarvel::System::DateTime date;
+      if (!Tarvel::System::DateTime::TryParse(finding.message.substr(std::strlen(beginning)), date)) {
+        return "a message ends with no time: " + finding.message + '\n';
+      }
+      const bool isStart =
+          BeginsWith(finding.message, "Token start") || BeginsWith(finding.message, "The subject confirmation cannot");
+      const std::int64_t missed = (isStart ? date.GetUtcTime() - now : now - date.GetUtcTime()) - tolerance;
+      return std::abs(finding.missedBySec * SECOND - missed) <= SECOND
+                 ? ""
+                 : "a time is missed by " + std::to_string(missed / SECOND) + " s: " + finding.message + '\n';
+    }
+  }
+  return finding.missedBySec == 0 ? "" : "a time is missed by \"" + finding.message + "\"\n";
+}
+
+std::string FindWrongSaml2Times(const TokenReport &report, const Misses &misses, std::int64_t now,
+                                std::int64_t tolerance) {
+  std::string wrong;
+  if (report.accepted && (misses.start > 0 || misses.end >= 0)) {
+    wrong += "it is accepted at an invalid time\n";
+  }
+  for (const TokenReport::CheckResult &result : report.checks) {
+    for (const TokenReport::Finding &finding : result.findings) {
+      wrong += JudgeSaml2Finding(finding, now, tolerance);
+    }
+  }
+  return wrong;
+}
 
 std::string JudgeFinding(const TokenReport::Finding &finding, const Misses &misses) {
   const bool isStart = BeginsWith(finding.message, "Token start date is in the future: ");
@@ -60,6 +96,9 @@ std::string FindWrongTimes(const TokenReport &report, const VerifyOptions &optio
   const std::int64_t end = report.claims.endDate->GetUtcTime();
   const std::int64_t tolerance = options.clockToleranceSec * SECOND;
   const Misses misses{start - now - tolerance, now - end - tolerance};
+  if (options.profile == TokenProfile::SAML2) {
+    return wrong + FindWrongSaml2Times(report, misses, now, tolerance);
+  }
   const bool isValid = start < end && misses.start <= 0 && misses.end < 0;
   if (isValid != (validity.outcome == Outcome::PASSED)) {
     wrong += isValid ? "VALIDITY fails for a valid time\n" : "VALIDITY passes for an invalid time\n";

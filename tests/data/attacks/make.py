@@ -411,6 +411,120 @@ def unsigned_tokens():
         change(unsigned, '<saml:Conditions ', '<saml:Conditions Id="_conditions" '), signature.replace(f'#{ID}', '#_conditions')))
 
 
+def saml2_content():
+    """Attacks on what the profile SAML2 ignores or reads in addition; expected-saml2.tsv is about these, too."""
+    def genuine(name):
+        with open(os.path.join(HERE, '..', 'saml2', name + '.xml'), encoding='utf-8') as file:
+            return file.read().strip()
+
+    stock = genuine('wss4j-confirmation-data')
+    stock_id = re.search(r' ID="([^"]*)"', stock).group(1)
+    stock_signature = SIGNATURE.search(stock).group()
+    plain = stock.replace(stock_signature, '')
+    confirmation = re.search(r'<saml2:SubjectConfirmationData [^>]*/>', plain).group()
+    authn = ('<saml2:AuthnStatement AuthnInstant="2020-01-01T00:00:00Z"><saml2:AuthnContext><saml2:AuthnContextDecl>{}'
+             '</saml2:AuthnContextDecl></saml2:AuthnContext></saml2:AuthnStatement></saml2:Assertion>')
+    end = '</saml2:Assertion>'
+    containers = {
+        'advice': (end, '<saml2:Advice>{}</saml2:Advice>' + end),
+        'foreign-advice': (end, '<saml2:Advice><x>{}</x></saml2:Advice>' + end),
+        'confirmation-data': (confirmation, confirmation[:-2] + '>{}</saml2:SubjectConfirmationData>'),
+        'unknown-confirmation': ('<saml2:SubjectConfirmation ', '<saml2:SubjectConfirmation Method="urn:x">'
+                                 '<saml2:SubjectConfirmationData>{}</saml2:SubjectConfirmationData>'
+                                 '</saml2:SubjectConfirmation><saml2:SubjectConfirmation '),
+        'attribute-value': (end, '<saml2:AttributeStatement><saml2:Attribute Name="a"><saml2:AttributeValue>{}'
+                            '</saml2:AttributeValue></saml2:Attribute></saml2:AttributeStatement>' + end),
+        'authn-declaration': (end, authn),
+    }
+
+    def inside(text, container, content):
+        old, new = containers[container]
+        return change(text, old, new.replace('{}', content))
+
+    def with_signature(text, new_signature):
+        return change(text, '</saml2:Issuer>', '</saml2:Issuer>' + new_signature)
+
+    for name, evil_id in (('same-id', stock_id), ('other-id', '_forged')):
+        evil = change(plain, '>alice<', '>mallory<').replace(stock_id, evil_id)
+        for container in containers:
+            write(f'saml2-wrap-original-in-{container}-{name}', inside(with_signature(evil, stock_signature), container, plain))
+            write(f'saml2-wrap-signed-original-in-{container}-{name}', inside(evil, container, stock))
+            write(f'saml2-wrap-twice-signed-original-in-{container}-{name}',
+                  inside(with_signature(evil, stock_signature), container, stock))
+    for container in containers:
+        # The genuine token, whose signature is where the profile ignores what it does not know.
+        write(f'saml2-signature-in-{container}', inside(plain, container, stock_signature))
+        # Nobody signed the added content.
+        write(f'saml2-added-{container}', inside(stock, container, '<x/>'))
+        # The service signed content of a caller, who chose the identifier of the assertion.
+        template = blank(inside(stock, container, f'<x xmlns="urn:x" Id="{stock_id}"/>'))
+        write(f'saml2-signed-duplicate-id-in-{container}', sign(template))
+        # The service signed content of a caller, who put an assertion there.
+        nested = change(plain, '>alice<', '>mallory<').replace(stock_id, '_nested')
+        write(f'saml2-signed-assertion-in-{container}', sign(blank(inside(stock, container, nested))))
+        nested_signed = with_signature(nested, stock_signature)
+        inner = inside(stock, container, '@NESTED@')
+        write(f'saml2-nested-assertion-with-the-signature-in-{container}', change(inner, '@NESTED@', nested_signed))
+
+    # Canonicalisation removes comments, so these are still validly signed.
+    for name, file, old, new in (
+            ('name', 'name-email', 'alice@corp', 'alice@<!-- -->corp'),
+            ('issuer', 'name-email', 'https://idp.', 'https://<!-- -->idp.'),
+            ('audience', 'conditions-disjoint-audience-restrictions', '>urn:a<', '>urn<!-- -->:a<'),
+            ('delegate', 'delegation', '>last@', '>last<!-- -->@'),
+            ('confirming-name', 'delegation-confirmed', 'Confirmation Method="urn:oasis:names:tc:SAML:2.0:cm:bearer">'
+             '<saml2:NameID>last@', 'Confirmation Method="urn:oasis:names:tc:SAML:2.0:cm:bearer"><saml2:NameID>last<!-- -->@'),
+            ('attribute', 'wss4j-attributes', '>auditor<', '>aud<!-- -->itor<'),
+            ('class', 'wss4j-attributes', 'classes:Password<', 'classes:Pass<!-- -->word<'),
+            ('key', 'holder-rsa-value', '<ds:Exponent>AQ', '<ds:Exponent>AQ<!-- -->'),
+            ('point', 'holder-ec-value', '<dsig11:PublicKey>BJ', '<dsig11:PublicKey>BJ<!-- -->')):
+        write(f'saml2-split-comment-in-{name}', change(genuine(file), old, new))
+    attributes = genuine('attributes-all-values')
+    write('saml2-comment-in-xml-value', change(attributes, '>inner<', '>in<!-- -->ner<'))
+
+    for name, old, new in (
+            ('qualifier-removed', ' NameQualifier="http://sts.partner.example/names"', ''),
+            ('qualifier-changed', 'partner.example/names"', 'partner.example/Names"'),
+            ('format-removed', ' Format="urn:oasis:names:tc:SAML:1.1:nameid-format:unspecified"', ''),
+            ('recipient-removed', ' Recipient="https://files.corp.example/consume"', ''),
+            ('request-changed', '"_request-1"', '"_request-2"'),
+            ('address-removed', ' Address="192.0.2.7"', ''),
+            ('confirmation-lasts-longer', 'NotOnOrAfter="2119', 'NotOnOrAfter="2120'),
+            ('method-changed', 'cm:bearer', 'cm:holder-of-key'),
+            ('type-removed', ' xsi:type="saml2:AssertionType"', ''),
+            ('type-unbound', 'xsi:type="saml2:AssertionType"', 'xsi:type="s:AssertionType"'),
+            ('type-without-prefix', 'xsi:type="saml2:AssertionType"', 'xsi:type="AssertionType"'),
+            ('type-of-another-namespace', 'xsi:type="saml2:AssertionType"', 'xmlns:s="urn:x" xsi:type="s:AssertionType"'),
+            ('confirmation-added', '<saml2:SubjectConfirmation ', '<saml2:SubjectConfirmation Method='
+             '"urn:oasis:names:tc:SAML:2.0:cm:bearer"/><saml2:SubjectConfirmation ')):
+        write(f'saml2-{name}', change(stock, old, new))
+    conditions = genuine('wss4j-conditions')
+    write('saml2-audience-restriction-removed', re.sub(r'<saml2:AudienceRestriction>.*?</saml2:AudienceRestriction>', '',
+                                                       conditions, count=1, flags=re.S))
+    write('saml2-one-time-use-removed', change(conditions, '<saml2:OneTimeUse/>', ''))
+    session = genuine('authn-everything')
+    write('saml2-session-extended', change(session, 'SessionNotOnOrAfter="2119', 'SessionNotOnOrAfter="2120'))
+    # With exclusive canonicalisation, the binding of a prefix that only a type's name uses is not signed.
+    delegated = genuine('delegation')
+    prefix = re.search(r'xsi:type="([^":]*):DelegationRestrictionType"', delegated).group(1)
+    write('saml2-delegation-type-rebound', change(
+        delegated, f'xsi:type="{prefix}:DelegationRestrictionType"', f'xmlns:e="urn:evil" xsi:type="e:DelegationRestrictionType"'))
+    holder = genuine('holder-certificate-and-value')
+    other = re.sub(r'-----[^-]*-----', '', open(key('other.crt'), encoding='ascii').read())
+    write('saml2-holder-certificate-changed', re.sub(
+        r'(<saml2:SubjectConfirmationData.*<ds:X509Certificate>)[^<]*', lambda m: m.group(1) + other, holder, flags=re.S))
+    write('saml2-holder-value-changed', re.sub(
+        r'(<saml2:SubjectConfirmationData.*<ds:Modulus>)....', lambda m: m.group(1) + 'AAAA', holder, flags=re.S))
+    write('saml2-holder-value-only', re.sub(
+        r'(<saml2:SubjectConfirmationData.*)<ds:X509Data>.*?</ds:X509Data>', lambda m: m.group(1), holder, flags=re.S))
+    # The service signed these, and none of them is the method that it looks like.
+    for name, method in (('blank-before', ' urn:oasis:names:tc:SAML:2.0:cm:bearer'), ('blank-after', 'urn:oasis:names:tc:SAML:2.0:cm:bearer '),
+                         ('no-break-blank', '&#xA0;urn:oasis:names:tc:SAML:2.0:cm:bearer'), ('upper-case', 'URN:OASIS:names:tc:SAML:2.0:cm:bearer'),
+                         ('longer', 'urn:oasis:names:tc:SAML:2.0:cm:bearer#'), ('percent', 'urn:oasis:names:tc:SAML:2.0:cm:beare%72'),
+                         ('older', 'urn:oasis:names:tc:SAML:1.0:cm:bearer'), ('empty', '')):
+        write(f'saml2-method-{name}', sign(blank(change(stock, 'urn:oasis:names:tc:SAML:2.0:cm:bearer', method))))
+
+
 def documents():
     with open(os.path.join(HERE, 'not-utf-8.xml'), 'wb') as file:
         file.write(bearer.replace('alice@', '\udcff@').encode('utf-8', 'surrogateescape'))
@@ -426,7 +540,7 @@ def documents():
 
 
 GROUPS = (wrapping, duplicate_ids, entities, splitting, namespaces, algorithms, signature_values, resigned_digests,
-          foreign_keys, unsigned_tokens, documents)
+          foreign_keys, unsigned_tokens, saml2_content, documents)
 for group in GROUPS:
     if len(sys.argv) == 1 or group.__name__ in sys.argv[1:]:
         group()

@@ -1,7 +1,7 @@
 #!/bin/bash
 # SPDX-License-Identifier: Apache-2.0
 # Makes the tokens of this folder with the keys of ../tokens: those in details.txt, and details.txt itself, with OpenSAML and
-# WSS4J, the others with xmlsec1. expected.tsv is written by hand.
+# WSS4J, the others with xmlsec1. It does not make expected.tsv.
 # usage: make.sh JARS      a folder with the jars of org.apache.wss4j:wss4j-ws-security-dom:2.4.3 (Maven Central) and of what it
 #                          depends on, such as OpenSAML 3.4.6 and Santuario 2.3.4; Java 17 or later
 set -euo pipefail

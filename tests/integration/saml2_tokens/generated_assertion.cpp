@@ -1,4 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
+// Long because each function writes one kind of element of the standard's schema, and they belong together.
 
 #include "generated_assertion.h"
 

@@ -8,6 +8,7 @@
 #include "xml/xml_text.h"
 
 #include <ssoclient/create_saml_token.h>
+#include <ssoclient/token_verifier.h>
 #include <tarvel/xml/parser.h>
 
 #include <stdexcept>
@@ -26,6 +27,15 @@ Outcome Try(const Factory &factory) {
   } catch (...) {
     return {"undocumented", "no std::exception"};
   }
+}
+
+const TokenVerifier &Saml2Verifier() {
+  static const TokenVerifier VERIFIER = [] {
+    VerifyOptions options;
+    options.profile = TokenProfile::SAML2;
+    return TokenVerifier(Trusted(), options);
+  }();
+  return VERIFIER;
 }
 
 const Tarvel::Xml::Node *NextInDocumentOrder(const Tarvel::Xml::Node *node) {
@@ -67,15 +77,21 @@ const Tarvel::Crypto::CertificateList &Trusted() {
   return TRUSTED;
 }
 
-Outcome TryToken(const std::string &xml) {
-  return Try([&] { return CreateSamlToken(xml, Trusted()); });
+Outcome TryToken(const std::string &xml, TokenProfile profile) {
+  if (profile == TokenProfile::STRICT) {
+    return Try([&] { return CreateSamlToken(xml, Trusted()); });
+  }
+  return Try([&] { return Saml2Verifier().Verify(xml); });
 }
 
-Outcome TryElement(const std::string &xml, std::size_t index) {
+Outcome TryElement(const std::string &xml, std::size_t index, TokenProfile profile) {
   Tarvel::Ref<Tarvel::Xml::Document> document;
   ParseXML(xml, document);
   const Tarvel::Xml::ElementNode &element = FindAssertion(*document, index);
-  return Try([&] { return CreateSamlTokenFromDom(element, Trusted()); });
+  if (profile == TokenProfile::STRICT) {
+    return Try([&] { return CreateSamlTokenFromDom(element, Trusted()); });
+  }
+  return Try([&] { return Saml2Verifier().Verify(element); });
 }
 
 std::string ReadToken(const std::string &name) {

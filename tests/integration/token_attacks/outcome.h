@@ -4,6 +4,7 @@
 
 #pragma once
 
+#include <ssoclient/verify_options.h>
 #include <tarvel/crypto/certificate.h>
 #include <tarvel/xml/node.h>
 
@@ -27,12 +28,13 @@ std::ostream &operator<<(std::ostream &out, const Outcome &outcome);
 /// The service's certificates, one for each kind and size of key that signs the fixtures; not "other".
 const Tarvel::Crypto::CertificateList &Trusted();
 
-/// The outcome for `xml` with those certificates and the default tolerance.
-Outcome TryToken(const std::string &xml);
+/// The outcome for `xml` with those certificates and the default options.
+Outcome TryToken(const std::string &xml, SsoClient::TokenProfile profile = SsoClient::TokenProfile::STRICT);
 
 /// The outcome for the assertion number `index` (from 0, in document order) of the document `xml`.
 /// @throws std::out_of_range when there are fewer assertions.
-Outcome TryElement(const std::string &xml, std::size_t index);
+Outcome TryElement(const std::string &xml, std::size_t index,
+                   SsoClient::TokenProfile profile = SsoClient::TokenProfile::STRICT);
 
 /// A token fixture by its name without folder and extension.
 std::string ReadToken(const std::string &name);

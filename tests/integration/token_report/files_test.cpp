@@ -59,6 +59,16 @@ TEST_F(ReportsOnFiles, AreRightForAttacks) {
   }
 }
 
+TEST_F(ReportsOnFiles, AreRightForTokensOfOtherTools) {
+  OutcomeCount count;
+  ExpectRightReports("saml2", count);
+  EXPECT_GT(count.GetAccepted(), 200u);
+  EXPECT_GT(count.GetDifferentRefusals(), 45u);
+  for (const char *const check : {"form", "validity", "confirmation", "delegation", "names", "audience"}) {
+    EXPECT_GT(count.GetFirstFailed().count(check), 0u) << check;
+  }
+}
+
 TEST_F(ReportsOnFiles, AreRightForMessagesThatAreNotTokens) {
   OutcomeCount count;
   ExpectRightReports("requests", count);

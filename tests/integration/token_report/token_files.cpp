@@ -24,7 +24,7 @@ std::vector<TokenFile> ReadTokenFiles(const std::string &folder) {
 const std::vector<TokenFile> &AllTokenFiles() {
   static const std::vector<TokenFile> all = [] {
     std::vector<TokenFile> files;
-    for (const char *const folder : {"tokens", "attacks", "requests"}) {
+    for (const char *const folder : {"tokens", "attacks", "saml2", "requests"}) {
       for (TokenFile &file : ReadTokenFiles(folder)) {
         files.push_back(std::move(file));
       }

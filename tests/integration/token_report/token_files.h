@@ -17,7 +17,7 @@ struct TokenFile {
 /// All XML files of a folder, such as "tokens", sorted by name.
 std::vector<TokenFile> ReadTokenFiles(const std::string &folder);
 
-/// The files of the folders tokens, attacks and requests.
+/// The files of the folders tokens, attacks, saml2 and requests.
 const std::vector<TokenFile> &AllTokenFiles();
 
 } // namespace Reports

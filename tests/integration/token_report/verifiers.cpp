@@ -60,6 +60,24 @@ std::vector<VerifyOptions> Choices() {
           WithConfirmation(SamlToken::HOLDER_OF_KEY)};
 }
 
+/// Those of the profile STRICT, and what only the profile SAML2 checks.
+std::vector<VerifyOptions> Saml2Choices() {
+  std::vector<VerifyOptions> choices = Choices();
+  VerifyOptions options;
+  options.acceptedRecipients = {"https://elsewhere.example/", "https://files.corp.example/consume"};
+  choices.push_back(options);
+  options.expectedInResponseTo = "_request-1";
+  options.senderAddress = "192.0.2.7";
+  choices.push_back(options);
+  options.expectedInResponseTo = "_request-2";
+  options.requiredConfirmation = SamlToken::HOLDER_OF_KEY;
+  choices.push_back(options);
+  for (VerifyOptions &one : choices) {
+    one.profile = SsoClient::TokenProfile::SAML2;
+  }
+  return choices;
+}
+
 } // namespace
 
 Tarvel::Ref<const Tarvel::Crypto::Certificate> Certificate(const std::string &name) {
@@ -73,6 +91,9 @@ const std::vector<JudgedVerifier> &AllVerifiers() {
       for (const VerifyOptions &options : Choices()) {
         verifiers.emplace_back(trusted, options);
       }
+    }
+    for (const VerifyOptions &options : Saml2Choices()) {
+      verifiers.emplace_back(KeysOfTheService(), options);
     }
     return verifiers;
   }();
