@@ -349,7 +349,8 @@ void Writer::Value() {
     m_attributes += "text {}\n";
     return;
   case 1:
-    m_xml += "<s:AttributeValue xmlns:i=\"http://www.w3.org/2001/XMLSchema-instance\" i:nil=\"true\"/>";
+    m_xml += "<s:AttributeValue xmlns:i=\"http://www.w3.org/2001/XMLSchema-instance\" i:nil=\"" +
+             std::string(Maybe() ? "true" : "1") + "\"/>";
     m_attributes += "nil {}\n";
     return;
   case 2:

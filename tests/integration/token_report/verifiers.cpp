@@ -72,6 +72,13 @@ std::vector<VerifyOptions> Saml2Choices() {
   options.expectedInResponseTo = "_request-2";
   options.requiredConfirmation = SamlToken::HOLDER_OF_KEY;
   choices.push_back(options);
+  VerifyOptions otherRequest;
+  otherRequest.expectedInResponseTo = "_request-2";
+  choices.push_back(otherRequest);
+  VerifyOptions otherSender;
+  otherSender.senderAddress = "192.0.2.8";
+  choices.push_back(otherSender);
+  choices.push_back(WithAudience("urn:a", true)); // one of two restrictions, or both
   for (VerifyOptions &one : choices) {
     one.profile = SsoClient::TokenProfile::SAML2;
   }
