@@ -185,7 +185,7 @@ std::vector<Saml2Document> Documents() {
        "'>a</saml:NameID></d:Delegate></saml:Condition>" + END},
       {"Advice", NO_CONDITIONS, NO_CONDITIONS + "<saml:Advice>", Thin("<a~/>", 1), "</saml:Advice>"},
       {"AdviceWithAssertions", NO_CONDITIONS, NO_CONDITIONS + "<saml:Advice>",
-       [](std::size_t i) { return "<saml:Assertion ID='" + Bench::Name(i) + "'/>"; }, "</saml:Advice>"},
+       [](std::size_t i) { return "<saml:Assertion ID='nested-" + Bench::Name(i) + "'/>"; }, "</saml:Advice>"},
   };
 }
 
