@@ -249,6 +249,9 @@ void ConfirmationChoice::Check(std::size_t index, DeviationSink &sink) const {
     Refuse(sink, PlaceOf(confirmation), "a certificate or an RSA or EC public key", std::string_view(),
            "The holder-of-key confirmation has no usable key");
   }
+  if (confirmation.bearerKey) {
+    Refuse(sink, confirmation.bearerKey, "no key", std::string_view(), "The bearer confirmation has a key");
+  }
 }
 
 boost::optional<Deviation> ConfirmationChoice::GetRefusal(std::size_t index) const {

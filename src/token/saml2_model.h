@@ -27,6 +27,8 @@ struct Saml2Confirmation {
   const Tarvel::Xml::ElementNode *element = nullptr; ///< the `SubjectConfirmation`
   const Tarvel::Xml::ElementNode *nameId = nullptr;  ///< its `NameID`; null if there is none
   const Tarvel::Xml::ElementNode *data = nullptr;    ///< its `SubjectConfirmationData`; null if there is none
+  const Tarvel::Xml::ElementNode *bearerKey =
+      nullptr; ///< a `ds:KeyInfo` of a bearer confirmation, which contradicts its method
 };
 
 /// An assertion in the profile SAML2. It exists only while a token is made. Pointers are valid as long as the tree.

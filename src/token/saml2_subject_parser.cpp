@@ -6,7 +6,6 @@
 #include "token/saml2_key_info.h"
 #include "token/subject_parser.h"
 #include "xml/expected_element.h"
-#include "xml/form_text.h"
 #include "xml/refuse.h"
 #include "xml/strict_checks.h"
 
@@ -54,16 +53,17 @@ void ParseMethod(const ElementNode &element, Saml2Confirmation &confirmation, Co
 }
 
 /// Reads the content of the data of a known method: the first key. The standard allows any elements and text, and
-/// everything else is ignored.
-void ParseContent(NodeFilterIterator child, SamlToken::ConfirmationType type, ConfirmationDetails &details,
+/// everything else is ignored. A key of a bearer confirmation is not read.
+void ParseContent(NodeFilterIterator child, Saml2Confirmation &confirmation, ConfirmationDetails &details,
                   DeviationSink &sink) {
   for (bool isKeyRead = false; child.node; child.MoveToSibling()) {
     const ElementNode *const element = IteratorToElement(child);
-    const bool isKeyInfo = ElementQNameIs(element, "KeyInfo", Namespaces::DS);
-    if (isKeyInfo && type == SamlToken::BEARER) {
-      Refuse(sink, child, "no key", WhatIsAt{element}, "A bearer confirmation must not have a key: '%1'",
-             element->GetName());
-    } else if (isKeyInfo && !isKeyRead) {
+    if (!ElementQNameIs(element, "KeyInfo", Namespaces::DS)) {
+      continue;
+    }
+    if (confirmation.type == SamlToken::BEARER) {
+      confirmation.bearerKey = element;
+    } else if (!isKeyRead) {
       isKeyRead = ParseKeyInfo(child, details, sink);
     }
   }
@@ -83,7 +83,7 @@ void ParseData(NodeFilterIterator &iterator, Saml2Confirmation &confirmation, Co
   details.inResponseTo = ReadOptionalText(data, "InResponseTo");
   details.address = ReadOptionalText(data, "Address");
   if (confirmation.type) {
-    ParseContent(iterator.GetChild(), *confirmation.type, details, sink);
+    ParseContent(iterator.GetChild(), confirmation, details, sink);
   }
   iterator.MoveToSibling();
 }

@@ -109,4 +109,19 @@ TEST_F(Saml2PlacesTest, SetsTheElementsOfTheChosenConfirmation) {
   EXPECT_EQ("urn:oasis:names:tc:SAML:2.0:cm:bearer", *used.writtenMethod);
 }
 
+TEST_F(Saml2PlacesTest, ReportsTheKeyOfABearerConfirmationWhichIsNotUsed) {
+  const std::string withKey = Piece::Confirmation(
+      "bearer", "<saml:SubjectConfirmationData><ds:KeyInfo>any</ds:KeyInfo></saml:SubjectConfirmationData>");
+  Accepted alone(AssertionConfirmedBy(withKey));
+  const auto all = AllOf([&](DeviationSink &sink) { ChooseConfirmation(alone, VerifyOptions(), DateTime(NOW), sink); });
+  ASSERT_EQ(1u, all.size());
+  EXPECT_EQ("The bearer confirmation has a key", all[0].message);
+  EXPECT_EQ("ds:KeyInfo/", PlaceOf(all[0]));
+  EXPECT_TRUE(alone.details.confirmations[0].publicKey.empty());
+
+  Accepted beforeAnother(AssertionConfirmedBy(withKey + Piece::Confirmation("bearer", "")));
+  EXPECT_TRUE(ChooseConfirmation(beforeAnother, VerifyOptions(), DateTime(NOW), ThrowingSink()));
+  EXPECT_EQ(1u, beforeAnother.details.usedConfirmation);
+}
+
 } // namespace
