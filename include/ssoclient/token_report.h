@@ -36,7 +36,7 @@ struct UnverifiedClaims {
   boost::optional<Tarvel::System::DateTime> issueInstant;    ///< when it was issued, as the issuer states
   boost::optional<std::string> nameId;                       ///< the subject's identifier as written
   boost::optional<std::string> nameIdFormat;                 ///< the `Format` of the subject's identifier
-  boost::optional<PrincipalId> subject;                      ///< set for a user principal name; with SAML2, always
+  boost::optional<PrincipalId> subject;                      ///< set for a user principal name; with SAML2, for any
   boost::optional<SamlToken::ConfirmationType> confirmation; ///< set if known; with SAML2, if it can be used
   boost::optional<std::string> confirmationMethod;           ///< as written; set for methods that are not known, too
   boost::optional<Tarvel::System::DateTime> startDate;       ///< valid from this instant
@@ -73,16 +73,16 @@ struct TokenReport {
     FORM,            ///< elements, attributes and values are those of the profile, and the signature covers the token
     IDENTIFIERS,     ///< version and identifier
     VALIDITY,        ///< this machine's clock is within the time of validity
-    CONFIRMATION, ///< the confirmation lasts as long as the token; with the profile SAML2: at least one confirmation
-                  ///< can be used with these `VerifyOptions`, and no session has ended
-    DELEGATION,   ///< the delegate of the confirmation is the last delegate of the restriction
-    ALGORITHMS,   ///< the signature uses only accepted algorithms, transforms and parts
-    KEYS,         ///< a trusted key can be used with the signature's algorithm
-    REFERENCES,   ///< each reference resolves to one node, which contains the signature if it is enveloped
-    SIGNATURE,    ///< a trusted key made the signature
-    DIGESTS,      ///< the digest of each reference is the one that was signed
-    NAMES,        ///< subject, groups, delegates and attributes can be read
-    AUDIENCE,     ///< the token is for an accepted audience; passed if `VerifyOptions` accept every audience
+    CONFIRMATION,    ///< the confirmation lasts as long as the token; with the profile SAML2: at least one confirmation
+                     ///< can be used with these `VerifyOptions`, and no session has ended
+    DELEGATION,      ///< the delegate of the confirmation is the last delegate of the restriction
+    ALGORITHMS,      ///< the signature uses only accepted algorithms, transforms and parts
+    KEYS,            ///< a trusted key can be used with the signature's algorithm
+    REFERENCES,      ///< each reference resolves to one node, which contains the signature if it is enveloped
+    SIGNATURE,       ///< a trusted key made the signature
+    DIGESTS,         ///< the digest of each reference is the one that was signed
+    NAMES,           ///< subject, groups, delegates and attributes can be read
+    AUDIENCE,        ///< the token is for an accepted audience; passed if `VerifyOptions` accept every audience
     REQUIRED_CONFIRMATION ///< the token has the confirmation that `VerifyOptions` require, if they require one
   };
 
