@@ -150,7 +150,8 @@ SSOCLIENT_API std::shared_ptr<SecurityTokenService>
 CreateSecurityTokenService(const SecurityTokenServiceConfig &config);
 
 /// The same with options, which are copied.
-/// @throws Tarvel::InvalidArgumentException also when `CheckServiceDialect` refuses the dialect.
+/// @throws Tarvel::InvalidArgumentException also when `CheckServiceDialect` refuses the dialect, or when
+///         `TokenVerifier` refuses the `verifyOptions`.
 SSOCLIENT_API std::shared_ptr<SecurityTokenService> CreateSecurityTokenService(const SecurityTokenServiceConfig &config,
                                                                                const ServiceOptions &options);
 

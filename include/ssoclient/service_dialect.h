@@ -21,8 +21,8 @@ struct FaultName {
 };
 
 /// What requests contain, and how responses are read, where services differ. Each default is what this client has
-/// always done: the default dialect changes no octet of any message. `docs/interoperate.md` lists the faults by which
-/// you find the switch that a service needs.
+/// always done: the default dialect changes no octet of any message. `docs/interoperate.md` lists the symptoms by
+/// which you find the switch that a service needs.
 struct SSOCLIENT_API ServiceDialect {
   /// When a request has an element that only states a choice.
   enum class Statement : std::int32_t {
