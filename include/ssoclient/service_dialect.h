@@ -45,7 +45,7 @@ struct SSOCLIENT_API ServiceDialect {
 
   /// Whether `Content-Type` declares `charset=utf-8`.
   bool declaresCharset = false;
-  /// The address in `wsp:AppliesTo`, of the service that will receive the token. If empty, the element is not written.
+  /// The address in `wsp:AppliesTo`, of the service that will receive the token. If unset, the element is not written.
   boost::optional<std::string> appliesTo;
   /// Whether the header has the elements of WS-Addressing 1.0. They are signed when the message is signed.
   bool addressing = false;
