@@ -1,8 +1,8 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
 /// Arbitrary bytes as a token, in both profiles: only the documented exceptions are thrown; an accepted token has the
-/// facts of one of the tokens that the trusted key signed, and its text is returned byte for byte; the tree gives the same
-/// outcome as the text; and the profile SAML2 reads all that the profile STRICT reads.
+/// facts of one of the tokens that the trusted key signed, and its text is returned byte for byte; the tree has the
+/// same outcome as the text; and the profile SAML2 accepts all that the profile STRICT accepts, with the same facts.
 
 #include "support/data_file.h"
 #include "support/facts_of.h"
@@ -141,7 +141,7 @@ void ReadUnverifiedSaml2Facts(const ElementNode &element) {
   }
 }
 
-/// What the verification of `xml` returns, after the checks that are the same in both profiles.
+/// Verifies `xml`, checks the outcome in the same way for both profiles, and returns the token; null if it is refused.
 std::shared_ptr<const SamlToken> Judge(const std::string &xml, const Profile &profile) {
   const auto requireGenuine = [&profile](const std::shared_ptr<const SamlToken> &token) {
     Require(!token || profile.genuineFacts.count(Testing::FactsOf(*token)) == 1);

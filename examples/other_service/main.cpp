@@ -1,11 +1,11 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// Gets a token from an Apache CXF service, renews, validates and exchanges it, and prints what each token says.
+/// Gets a token from an Apache CXF service, renews, validates and exchanges it, and prints what each token states.
 ///
-/// Usage: other_service client.pem client.key, with the variables STS_URL (the service's endpoint), STS_CA (PEM: the authority of
-/// its web server), STS_CERT (PEM: the certificates that it signs tokens with), STS_USER and STS_PASSWORD
+/// Usage: other_service client.pem client.key, with the variables STS_URL (the service's endpoint), STS_CA (PEM: the
+/// authority of its web server), STS_CERT (PEM: the certificates with which it signs tokens), STS_USER and STS_PASSWORD
 ///
-/// A password in the environment can be read by other processes of the same user; the example `acquire` shows a better way.
+/// Other processes of the same user can read a password in the environment. The example `acquire` shows a better way.
 
 #include <ssoclient/security_token_service.h>
 #include <ssoclient/service_options.h>

@@ -52,7 +52,8 @@ SSOCLIENT_API std::shared_ptr<GssNegotiationContext>
 CreateGssNegotiationContext(const SecurityTokenServiceConfig &config, const TokenSpec &spec);
 
 /// The same with options, which are copied. Each call of `NegotiateToken` is one operation for the observer.
-/// @throws Tarvel::InvalidArgumentException also what `CheckServiceDialect` throws for the dialect.
+/// @throws Tarvel::InvalidArgumentException also when `CheckServiceDialect` refuses the dialect, or when
+///         `TokenVerifier` refuses the `verifyOptions`.
 SSOCLIENT_API std::shared_ptr<GssNegotiationContext>
 CreateGssNegotiationContext(const SecurityTokenServiceConfig &config, const TokenSpec &spec,
                             const ServiceOptions &options);

@@ -72,9 +72,9 @@ public:
   /// The same, returned.
   std::vector<Delegate> GetDelegationChain() const;
 
-  /// Sets `audience` to the audiences to which the token is restricted. Empty means no restriction. With several restrictions
-  /// (only in the profile SAML2), these are the audiences that all of them name; if there is none, the only entry is a
-  /// text that names the restrictions and is not the address of any service.
+  /// Sets `audience` to the audiences to which the token is restricted. Empty means no restriction. With several
+  /// restrictions (only in the profile SAML2), these are the audiences that all of the restrictions have. If they have
+  /// none in common, the only entry is a text that lists the restrictions and is not the address of any service.
   virtual void GetAudience(std::set<std::string> &audience) const = 0;
 
   /// The same, returned.

@@ -33,7 +33,7 @@ namespace SsoClient {
 ///   malformed, expired or not valid yet,
 /// - `Tarvel::InvalidArgumentException` for a lifetime that is not positive, for a text that XML cannot carry, for a
 ///   confirmation other than the default when a token is acquired by certificate, for renewing a bearer token, and for a
-///   specification that asks for what the dialect never states,
+///   `TokenSpec` that asks for something that the dialect never states,
 /// - `Tarvel::InvalidStateException` when a holder-of-key identity is needed and none is configured, and when the process uses
 ///   the network for the first time and has no thread or descriptor left for it (a later call tries again),
 /// - `Tarvel::Xml::Security::XmlSecurityException` for an identity whose key cannot sign with RSA-SHA256 (an EC key),
@@ -150,7 +150,8 @@ SSOCLIENT_API std::shared_ptr<SecurityTokenService>
 CreateSecurityTokenService(const SecurityTokenServiceConfig &config);
 
 /// The same with options, which are copied.
-/// @throws Tarvel::InvalidArgumentException also what `CheckServiceDialect` throws for the dialect.
+/// @throws Tarvel::InvalidArgumentException also when `CheckServiceDialect` refuses the dialect, or when
+///         `TokenVerifier` refuses the `verifyOptions`.
 SSOCLIENT_API std::shared_ptr<SecurityTokenService> CreateSecurityTokenService(const SecurityTokenServiceConfig &config,
                                                                                const ServiceOptions &options);
 

@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// `ServiceDialect`, how a token service of another maker wants to be asked.
+/// `ServiceDialect`, what a token service of another maker expects in requests, and how its responses are read.
 
 #pragma once
 
@@ -20,22 +20,23 @@ struct FaultName {
   std::string localName;    ///< of the fault code
 };
 
-/// What a request says and does not say, where services differ. Each default is what this client has always sent: a
-/// default dialect changes no octet of any message. `docs/interoperate.md` says which symptom each switch cures.
+/// What requests contain, and how responses are read, where services differ. Each default is what this client has
+/// always done: the default dialect changes no octet of any message. `docs/interoperate.md` lists the symptoms by
+/// which you find the switch that a service needs.
 struct SSOCLIENT_API ServiceDialect {
-  /// When an element that only states a choice is written.
+  /// When a request has an element that only states a choice.
   enum class Statement : std::int32_t {
     ALWAYS = 0, ///< with its value, true or false
-    WHEN_TRUE,  ///< only when it asks for something
-    NEVER       ///< not at all; a specification that asks for it is refused
+    WHEN_TRUE,  ///< only with the value true
+    NEVER       ///< not at all; a `TokenSpec` that asks for it is refused
   };
   /// What `wst:UseKey` contains in a request for a holder-of-key token.
   enum class UseKey : std::int32_t {
-    REFERENCE = 0, ///< nothing: its `Sig` names the message signature; not written when a token is presented
+    REFERENCE = 0, ///< nothing: its `Sig` refers to the message signature; not written when a token is presented
     CERTIFICATE,   ///< the certificate in a `ds:X509Data`, also when a token is presented
     NEVER          ///< the element is not written
   };
-  /// How the party is named to which the token is delegated.
+  /// The element for the party to which the token is delegated.
   enum class Delegation : std::int32_t {
     DELEGATE_TO = 0, ///< `wst:DelegateTo` (WS-Trust 1.3)
     ON_BEHALF_OF,    ///< `wst:OnBehalfOf` (WS-Trust 1.3): the token is about that party
@@ -44,9 +45,9 @@ struct SSOCLIENT_API ServiceDialect {
 
   /// Whether `Content-Type` declares `charset=utf-8`.
   bool declaresCharset = false;
-  /// The address in `wsp:AppliesTo`: the service for which the token is. Not written if none.
+  /// The address in `wsp:AppliesTo`, of the service that will receive the token. If unset, the element is not written.
   boost::optional<std::string> appliesTo;
-  /// Whether the header has the elements of WS-Addressing 1.0; signed when the message is.
+  /// Whether the header has the elements of WS-Addressing 1.0. They are signed when the message is signed.
   bool addressing = false;
   Statement delegatable = Statement::ALWAYS;       ///< `wst:Delegatable`
   Statement renewing = Statement::ALWAYS;          ///< `wst:Renewing`
@@ -60,22 +61,22 @@ struct SSOCLIENT_API ServiceDialect {
   bool standardTokenTypeReference = false;
   /// Faults that also mean that the service refuses the caller's credentials.
   std::vector<FaultName> credentialFaults;
-  /// Whether a response is found inside and outside a collection, whatever the operation.
+  /// Whether the response of every operation may be inside or outside a collection.
   bool acceptsAnyResponse = false;
 };
 
-/// The dialect of that name. The names are those of `GetDialectNames`.
+/// The dialect with this name, which must be one of `GetDialectNames`.
 /// @throws Tarvel::InvalidArgumentException for another name. The message lists the names.
 SSOCLIENT_API ServiceDialect GetServiceDialect(const std::string &name);
 
 /// The names of the dialects that are known: "default", and one for each service with which this client is tested.
 SSOCLIENT_API std::vector<std::string> GetDialectNames();
 
-/// Checks a dialect. `CreateSecurityTokenService` calls it.
-/// @throws Tarvel::InvalidArgumentException when `appliesTo`, a token type or the namespace of a fault is not an absolute
-///         URI, when a fault has no namespace or no local name, when the token type is known not to be SAML 2.0, when a
-///         credential fault is one that services also report for other reasons, and for a value that is not in its
-///         enumeration. The message says which.
+/// Checks a dialect. `CreateSecurityTokenService` and `CreateGssNegotiationContext` call it.
+/// @throws Tarvel::InvalidArgumentException when `appliesTo`, the token type or the namespace of a fault is not an
+///         absolute URI, when a fault has no namespace or no valid local name, when the token type is known not to be
+///         SAML 2.0, when a credential fault is one that services also report for other reasons, and for a value that
+///         is not in its enumeration. The message names the field.
 SSOCLIENT_API void CheckServiceDialect(const ServiceDialect &dialect);
 
 } // namespace SsoClient

@@ -21,7 +21,7 @@ struct ServiceOptions {
   /// is secret.** What the function throws is written to the log and changes nothing else.
   using RefusedTokenSink = std::function<void(const std::string &tokenXml)>;
 
-  /// How the service wants to be asked.
+  /// What the service expects in requests, and how its responses are read.
   ServiceDialect dialect;
 
   /// How the tokens that the service returns are verified.

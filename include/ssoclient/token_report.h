@@ -36,8 +36,8 @@ struct UnverifiedClaims {
   boost::optional<Tarvel::System::DateTime> issueInstant;    ///< when it was issued, as the issuer states
   boost::optional<std::string> nameId;                       ///< the subject's identifier as written
   boost::optional<std::string> nameIdFormat;                 ///< the `Format` of the subject's identifier
-  boost::optional<PrincipalId> subject;                      ///< set if the identifier is a user principal name
-  boost::optional<SamlToken::ConfirmationType> confirmation; ///< set if the method is known, and if one can be used
+  boost::optional<PrincipalId> subject;                      ///< set for a user principal name; with SAML2, for any
+  boost::optional<SamlToken::ConfirmationType> confirmation; ///< set if known; with SAML2, if it can be used
   boost::optional<std::string> confirmationMethod;           ///< as written; set for methods that are not known, too
   boost::optional<Tarvel::System::DateTime> startDate;       ///< valid from this instant
   boost::optional<Tarvel::System::DateTime> endDate;         ///< no longer valid at this instant
@@ -53,9 +53,10 @@ struct UnverifiedClaims {
   /// tokens.
   std::string certificateSubject;
   std::string certificateThumbprint;
-  /// Everything that the assertion states. Set if the profile SAML2 reads the assertion, whatever profile the report is for.
-  /// `usedConfirmation` is the number of confirmations if none of them can be used. `attributes` is empty if
-  /// `GetAttributes` would throw. The text of a value that contains a signature is empty: a report never repeats one.
+  /// What else the assertion states. Set if the profile SAML2 reads the assertion, even if the report is for the
+  /// profile STRICT. If no confirmation can be used, `usedConfirmation` is the number of confirmations. If
+  /// `GetAttributes` would throw, `attributes` is empty. If a value has elements with a signature, its text is empty,
+  /// because a report never repeats a signature.
   boost::optional<TokenDetails> details;
 };
 
@@ -72,16 +73,16 @@ struct TokenReport {
     FORM,            ///< elements, attributes and values are those of the profile, and the signature covers the token
     IDENTIFIERS,     ///< version and identifier
     VALIDITY,        ///< this machine's clock is within the time of validity
-    CONFIRMATION, ///< the confirmation lasts as long as the token; with the profile SAML2: one confirmation can be used
-                  ///< for what `VerifyOptions` require, and no session has ended
-    DELEGATION,   ///< the delegate of the confirmation is the last delegate of the restriction
-    ALGORITHMS,   ///< the signature uses only accepted algorithms, transforms and parts
-    KEYS,         ///< a trusted key can be used with the signature's algorithm
-    REFERENCES,   ///< each reference resolves to one node, which contains the signature if it is enveloped
-    SIGNATURE,    ///< a trusted key made the signature
-    DIGESTS,      ///< the digest of each reference is the one that was signed
-    NAMES,        ///< subject, groups, delegates and attributes can be read
-    AUDIENCE,     ///< the token is for an accepted audience; passed if `VerifyOptions` accept every audience
+    CONFIRMATION,    ///< the confirmation lasts as long as the token; with the profile SAML2: at least one confirmation
+                     ///< can be used with these `VerifyOptions`, and no session has ended
+    DELEGATION,      ///< the delegate of the confirmation is the last delegate of the restriction
+    ALGORITHMS,      ///< the signature uses only accepted algorithms, transforms and parts
+    KEYS,            ///< a trusted key can be used with the signature's algorithm
+    REFERENCES,      ///< each reference resolves to one node, which contains the signature if it is enveloped
+    SIGNATURE,       ///< a trusted key made the signature
+    DIGESTS,         ///< the digest of each reference is the one that was signed
+    NAMES,           ///< subject, groups, delegates and attributes can be read
+    AUDIENCE,        ///< the token is for an accepted audience; passed if `VerifyOptions` accept every audience
     REQUIRED_CONFIRMATION ///< the token has the confirmation that `VerifyOptions` require, if they require one
   };
 

@@ -24,8 +24,8 @@ public:
   /// @param trustedCertificates the certificates whose keys may have signed a token. The key is what is trusted: the
   ///        validity dates of the certificates are not checked. A null reference in the list is ignored. With an empty
   ///        list no token is accepted.
-  /// @throws Tarvel::InvalidArgumentException when `options` have an accepted recipient, an expected request or a sender's
-  ///         address, and the profile STRICT, which does not read these parts of a token.
+  /// @throws Tarvel::InvalidArgumentException when `options` with the profile STRICT have an accepted recipient, an
+  ///         expected request or a sender's address: this profile does not read these parts of a token.
   explicit TokenVerifier(const Tarvel::Crypto::CertificateList &trustedCertificates, const VerifyOptions &options = {});
 
   TokenVerifier(const TokenVerifier &) noexcept = default;            ///< shares the prepared keys

@@ -21,13 +21,14 @@ constexpr std::int64_t DEFAULT_CLOCK_TOLERANCE_SEC = 600;
 enum class TokenProfile : std::int32_t {
   STRICT = 0, ///< the form that the token service issues: its elements and attributes in their order, and no others
 
-  /// What SAML 2.0 core lets an issuer of authentication and attribute assertions write. Reads all that STRICT reads.
+  /// What SAML 2.0 core lets an issuer of authentication and attribute assertions write. This profile reads all that
+  /// STRICT reads.
   ///
   /// An identifier that is not of the form `name@domain` becomes a principal whose domain begins with "nameid:" and
   /// states the format and the qualifiers; `docs/interoperate.md` has the table. Where a format is case-sensitive, such as
   /// persistent and transient, compare `GetNameId`: `PrincipalId` ignores letter case.
   ///
-  /// A token is valid while its conditions hold, the confirmation that is used can be used, and no session in it has ended.
+  /// A token is valid while its conditions hold, the chosen confirmation can be used, and no session in it has ended.
   SAML2
 };
 
@@ -52,16 +53,18 @@ struct VerifyOptions {
   /// SAML2, a token may have several confirmations. Only those of the required kind are then used.
   boost::optional<SamlToken::ConfirmationType> requiredConfirmation;
 
-  /// The addresses of this program (`Recipient`), compared byte for byte. If the set is not empty, a bearer confirmation is
-  /// used only if it names one of them; if it is empty, a recipient is not checked. Only for the profile SAML2.
+  /// The addresses of this program (`Recipient`), compared byte for byte. If the set is not empty, a confirmation with
+  /// another recipient is not used, nor is a bearer confirmation without one. If it is empty, a recipient is not
+  /// checked. Only for the profile SAML2.
   std::set<std::string> acceptedRecipients;
 
-  /// The identifier of the request that the token must answer (`InResponseTo`). If set, a bearer confirmation is used
-  /// only if it states exactly this identifier; if not, what it states is not checked. Only for the profile SAML2.
+  /// The identifier of the request that the token must answer (`InResponseTo`), compared byte for byte. If it is set, a
+  /// confirmation with another identifier is not used, nor is a bearer confirmation without one. If it is not set, an
+  /// identifier is not checked. Only for the profile SAML2.
   boost::optional<std::string> expectedInResponseTo;
 
-  /// The network address of the token's sender. If set, a confirmation that states another `Address` is not used; if
-  /// not, the address is not checked. Only for the profile SAML2.
+  /// The network address of the token's sender. If it is set, a confirmation that states another `Address` is not used.
+  /// If it is not set, the address is not checked. Only for the profile SAML2.
   boost::optional<std::string> senderAddress;
 };
 

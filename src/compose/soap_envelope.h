@@ -18,7 +18,7 @@ namespace SsoClient {
 /// The elements of an envelope's header after `wsse:Security`.
 using HeaderBuilders = std::vector<XMLBuilderPtr>;
 
-/// An envelope that contains `header` and `body`. If one is null, its element is empty.
+/// An envelope: `header` and `more` are in its header, `body` is in its body. A builder that is null adds nothing.
 XMLBuilderPtr SoapBuilder(const XMLBuilderPtr &header, const XMLBuilderPtr &body, const HeaderBuilders &more = {});
 
 /// An envelope whose body, timestamp and header elements of WS-Addressing are signed when it is built. Each build makes a

@@ -17,8 +17,8 @@ constexpr std::string_view X509V3 =
 /// Username Token Profile 1.0: a password in clear text.
 constexpr std::string_view PASSWORD_TEXT =
     "http://docs.oasis-open.org/wss/2004/01/oasis-200401-wss-username-token-profile-1.0#PasswordText";
-// Services expect exactly these two spellings: "tokenprofile" in the token type, "token-profile" in the value type.
-// The published token type is for services that enforce the Basic Security Profile.
+// Services expect exactly these two spellings: "tokenprofile" in SAML_TOKEN_TYPE, "token-profile" in SAML_ID. The
+// published token type is for services that enforce the Basic Security Profile.
 constexpr std::string_view SAML_TOKEN_TYPE = "http://docs.oasis-open.org/wss/oasis-wss-saml-tokenprofile-1.1#SAMLV2.0";
 constexpr std::string_view SAML_TOKEN_TYPE_AS_PUBLISHED =
     "http://docs.oasis-open.org/wss/oasis-wss-saml-token-profile-1.1#SAMLV2.0";

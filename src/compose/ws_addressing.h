@@ -11,7 +11,7 @@
 
 namespace SsoClient {
 
-/// `wsa:To`, `wsa:Action`, `wsa:MessageID` with a new UUID, and `wsa:ReplyTo`, which says that the reply is the HTTP
+/// `wsa:To`, `wsa:Action`, `wsa:MessageID` with a new UUID, and `wsa:ReplyTo`, which states that the reply is the HTTP
 /// response. None of them has `mustUnderstand`.
 /// @param to the address of the service
 /// @param action the action of the request

@@ -39,7 +39,7 @@ bool IsWritten(ServiceDialect::Statement when, bool value) {
   return when == ServiceDialect::Statement::ALWAYS || (when == ServiceDialect::Statement::WHEN_TRUE && value);
 }
 
-/// The element in which the dialect names the party to which the token is delegated, without that party.
+/// The element for the party to which the token is delegated, still empty.
 XMLBuilderPtr DelegationElementBuilder(ServiceDialect::Delegation delegation) {
   switch (delegation) {
   case ServiceDialect::Delegation::ON_BEHALF_OF:

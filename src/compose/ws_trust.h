@@ -26,7 +26,7 @@ XMLCompositePtr CommonAcquireSecurityTokenBuilder(SamlToken::ConfirmationType co
                                                   const ServiceDialect &dialect = {});
 
 /// An issue request. For a holder-of-key token its last element is `wst:UseKey`, which refers to the message signature
-/// unless the dialect demands something else.
+/// unless the dialect demands the certificate or no such element.
 /// @param certificate for a `wst:UseKey` with the certificate
 /// @throws Tarvel::InvalidArgumentException when the certificate is needed and null.
 XMLCompositePtr AcquireSecurityTokenBuilder(SamlToken::ConfirmationType confirmation, const TokenSpec &spec,
@@ -34,7 +34,7 @@ XMLCompositePtr AcquireSecurityTokenBuilder(SamlToken::ConfirmationType confirma
                                             const Tarvel::Crypto::Certificate *certificate = nullptr);
 
 /// An issue request that presents a token. It has a `wst:UseKey` only if the dialect demands one with the certificate.
-/// @param certificate for that
+/// @param certificate for this `wst:UseKey`
 /// @throws Tarvel::InvalidArgumentException when the certificate is needed and null.
 XMLCompositePtr ExchangeSecurityTokenBuilder(SamlToken::ConfirmationType confirmation, const TokenSpec &spec,
                                              const ServiceDialect &dialect = {},
@@ -55,13 +55,13 @@ XMLBuilderPtr WssuLifetimeBuilder(std::int64_t seconds);
 /// `wst:Renewing`. Renewal after expiry is never requested.
 XMLBuilderPtr WstRenewingBuilder(bool allow);
 
-/// `wst:DelegateTo`, or the element that the dialect has for it, with the principal as a username token without password.
+/// `wst:DelegateTo`, or the dialect's element instead, with the principal as a username token without password.
 XMLBuilderPtr WstDelegateToBuilder(const std::string &name, const ServiceDialect &dialect = {});
 
 /// `wst:UseKey` with the certificate.
 XMLBuilderPtr WstUseKeyBuilder(const Tarvel::Crypto::Certificate &certificate);
 
-/// `wsp:AppliesTo` with the address of the service for which the token is.
+/// `wsp:AppliesTo` with the address of the service that will receive the token.
 XMLBuilderPtr WspAppliesToBuilder(const std::string &address);
 
 /// `wst:Participants`, one `wst:Participant` for each audience entry.

@@ -30,7 +30,7 @@ struct Request {
   std::string soapAction; ///< value of the `SOAPAction` HTTP header, without quotes
   std::string body;       ///< the whole envelope; secret
 
-  /// Whether the `Content-Type` HTTP header has the charset of the body.
+  /// Whether the `Content-Type` HTTP header declares the charset of the body.
   bool declaresCharset = false;
 
   /// Where the transport writes the facts of the response. Null, the default, if the caller does not need them.

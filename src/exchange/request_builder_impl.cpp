@@ -30,7 +30,7 @@ XMLBuilderPtr SecurityHeaderWith(const XMLBuilderPtr &token) {
   return header;
 }
 
-/// A request without `element` would silently ask for less than the spec.
+/// Refuses a spec that needs `element` if the dialect never has it: the request would silently ask for less.
 void ValidateStatement(const char *field, bool value, ServiceDialect::Statement when, const char *element) {
   if (value && when == ServiceDialect::Statement::NEVER) {
     throw Tarvel::InvalidArgumentException(std::string(field) + " is true, but the dialect of the service has no " +

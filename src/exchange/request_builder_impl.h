@@ -23,7 +23,7 @@ public:
   /// @throws Tarvel::InvalidArgumentException for an identity without key or certificate.
   explicit RequestBuilderImpl(const boost::optional<HolderOfKeyConfig> &holderOfKeyConfig);
 
-  /// @param dialect how the service wants to be asked; copied
+  /// @param dialect what the service expects in requests; copied
   /// @param serviceAddress the address of the service, for WS-Addressing
   RequestBuilderImpl(const boost::optional<HolderOfKeyConfig> &holderOfKeyConfig, const ServiceDialect &dialect,
                      const std::string &serviceAddress);
@@ -72,13 +72,13 @@ public:
   SamlToken::ConfirmationType GetEffectiveConfirmationType(TokenSpec::Confirmation confirmation) const;
 
 private:
-  /// @throws Tarvel::InvalidArgumentException for a spec that no request can be made from.
+  /// @throws Tarvel::InvalidArgumentException for a spec that no request can state.
   void ValidateSpec(const TokenSpec &spec) const;
   // The certificate of the identity; null if there is none.
   const Tarvel::Crypto::Certificate *GetCertificate() const;
   /// Sets the body of the request. An earlier body is wiped, because it may be secret, too.
   void SetBody(Request &request, std::string body) const;
-  // The header elements of WS-Addressing, if the dialect has them.
+  // The header elements of WS-Addressing; empty if the dialect has none.
   HeaderBuilders GetAddressing(const std::string &action) const;
   std::string BuildTokenRequest(TokenSpec::Confirmation confirmation, const XMLBuilderPtr &header,
                                 const XMLBuilderPtr &body, const std::string &action) const;

@@ -74,7 +74,7 @@ const ElementNode *FindInCollection(const ElementNode &body) {
   return FindDescendant(&body, {"RequestSecurityTokenResponseCollection", "RequestSecurityTokenResponse"});
 }
 
-/// The response if it is where it is expected, which any place is if the dialect says so. Otherwise null.
+/// `expected`; if that is null and the dialect accepts a response in any place, `other`. Each may be null.
 const ElementNode *Choose(const ElementNode *expected, const ElementNode *other, const ServiceDialect &dialect) {
   return expected || !dialect.acceptsAnyResponse ? expected : other;
 }

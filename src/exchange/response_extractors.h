@@ -3,8 +3,9 @@
 /// Extracts the result of each operation from the SOAP body of its response.
 ///
 /// Elements are found by local name: the namespace is ignored, and the first element of a name is used. All functions throw
-/// `SsoException` when an element that they need is missing. Each operation has one place for its response, in a
-/// collection or directly in the body. With `ServiceDialect::acceptsAnyResponse` the other place is searched next.
+/// `SsoException` when an element that they need is missing. The response of each operation is expected
+/// in one place, in a collection or directly in the body. With `ServiceDialect::acceptsAnyResponse`, the other place is
+/// searched next.
 
 #pragma once
 
@@ -27,8 +28,8 @@ std::string ExtractRenewedToken(const Tarvel::Xml::ElementNode &body, const Serv
 bool ExtractValidationStatus(const Tarvel::Xml::ElementNode &body, const ServiceDialect &dialect = {});
 
 /// One leg of a negotiation. The response to the final leg is in a collection and has the token; the earlier responses
-/// are not in a collection. With `ServiceDialect::acceptsAnyResponse`, the final response is the one that has the token. Its
-/// token type must be the one that was requested. Also throws what `CanonicalElementText` throws.
+/// are not in a collection. With `ServiceDialect::acceptsAnyResponse`, each response with a token is the final one. The
+/// token type of the final response must be the requested one. Also throws what `CanonicalElementText` throws.
 SPNegoResponse ExtractSPNegoLeg(const Tarvel::Xml::ElementNode &body, const ServiceDialect &dialect = {});
 
 } // namespace SsoClient

@@ -29,7 +29,7 @@ struct AuthenticationFault {
   std::string_view localName;
 };
 
-/// The fault codes with which every service may refuse the caller's credentials.
+/// The fault codes with which services refuse the caller's credentials in every dialect.
 constexpr AuthenticationFault AUTHENTICATION_FAULTS[] = {
     {Namespaces::WST, "FailedAuthentication"},
     {Namespaces::WST, "InvalidSecurityToken"},

@@ -23,7 +23,7 @@ Tarvel::Ref<const Tarvel::Xml::ElementNode> ParseResponseDocument(Tarvel::Reader
 
 /// Checks that there is no SOAP 1.1 fault in the body of `envelope`.
 /// @param listener receives the fault before the exception is thrown; null for none
-/// @param dialect names further faults with which the service refuses credentials
+/// @param dialect has further faults with which the service refuses credentials
 /// @throws InvalidCredentialsException for a fault that says that authentication failed.
 /// @throws SsoException for every other fault.
 /// @throws ParseException for a fault code whose prefix is not bound.

@@ -17,8 +17,8 @@ namespace {
 
 constexpr char DEFAULT_DIALECT[] = "default";
 
-/// Apache CXF 3.6 as it is published. `FailedAuthentication` is reported with `ws-security.return.security.error`.
-/// Without that setting CXF reports one general fault for every reason.
+/// An unchanged Apache CXF 3.6. It reports `FailedAuthentication` only with the setting
+/// `ws-security.return.security.error`; without it, it reports one general fault for every reason.
 ServiceDialect CxfDialect() {
   ServiceDialect dialect;
   dialect.declaresCharset = true;                                // otherwise CXF assumes ISO-8859-1
@@ -60,8 +60,8 @@ bool IsHexDigit(char c) noexcept {
   return IsDigit(c) || (c >= 'A' && c <= 'F') || (c >= 'a' && c <= 'f');
 }
 
-/// Whether RFC 3986 allows the text after the scheme of a URI: no other characters, each "%" with two digits, and at most
-/// one fragment.
+/// Whether RFC 3986 allows `rest` after the scheme of a URI: it has only the allowed characters, two hexadecimal digits
+/// after each "%", and at most one fragment, and is not empty.
 bool IsUriRest(std::string_view rest) noexcept {
   constexpr std::string_view PUNCTUATION = "-._~:/?[]@!$&'()*+,;=";
   bool hasFragment = false;
@@ -103,7 +103,7 @@ void CheckRange(const char *field, Enum value, Enum last) {
   }
 }
 
-/// Beginnings of the token types that this client would request in vain.
+/// Beginnings of the token types that this client cannot read.
 constexpr std::string_view UNREADABLE_TOKEN_TYPES[] = {
     "urn:oasis:names:tc:SAML:1.",
     "http://docs.oasis-open.org/wss/oasis-wss-saml-token-profile-1.1#SAMLV1",
@@ -128,7 +128,7 @@ struct GeneralFault {
   std::string_view localName;
 };
 
-/// Faults that services also report for reasons that have nothing to do with the caller's credentials.
+/// Faults that services also report for reasons other than the caller's credentials.
 constexpr GeneralFault GENERAL_FAULTS[] = {
     {Namespaces::SOAPENV, "Client"},
     {Namespaces::SOAPENV, "Server"},

@@ -11,7 +11,7 @@
 namespace SsoClient {
 
 /// The first SAML 2.0 assertion in the tree of `top` or, if there is none, the first "Assertion" in any namespace. Null
-/// if there is none either.
+/// if there is no such element.
 const Tarvel::Xml::ElementNode *FindAssertion(const Tarvel::Xml::Node *top);
 
 /// Reads the assertion at the cursor and moves the cursor to the next node. Only the form that the token service issues is

@@ -13,7 +13,7 @@ namespace SsoClient {
 
 namespace {
 
-/// Whether a report shows all of `text`, so that a longer one need not be made.
+/// Whether a report shows all of `text`. If not, nothing more need be added.
 bool IsShown(const std::string &text) {
   return text.size() <= Tarvel::StringUtil::MAX_VALUE_BYTES;
 }
@@ -24,7 +24,7 @@ std::string NameOf(const Saml2Assertion &assertion, std::size_t index) {
          (type ? std::string(GetConfirmationName(*type)) : assertion.details.confirmations[index].method) + ")";
 }
 
-/// Adds what a confirmation states and, if it was not compared with anything, says so.
+/// Adds a value that a confirmation states and, if it was not compared with anything, a remark.
 void AppendStated(std::string &text, const char *name, const boost::optional<std::string> &value, bool isCompared) {
   if (value) {
     text.append("; ").append(name).append(" \"").append(*value).append("\"");

@@ -10,7 +10,8 @@
 
 namespace SsoClient {
 
-/// The summary for a report. `assertion` must have a confirmation. The text is cut when it is longer than a report shows.
+/// The summary for a report. `assertion` must have a confirmation. When the text is longer than a report shows, nothing
+/// more is added to it.
 /// @param isChosen whether a confirmation has been chosen
 std::string SummaryOfConfirmations(const Saml2Assertion &assertion, const VerifyOptions &options,
                                    const Tarvel::System::DateTime &now, bool isChosen);

@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// What a report says about the profile for which it was not made.
+/// What the report for one profile states about the other profile.
 
 #pragma once
 
@@ -21,10 +21,10 @@ std::string RefusalOf(const Rule &rule) {
   }
 }
 
-/// Whether the profile `profile` reads or accepts, too, what the profile of the report has examined.
+/// The sentence that states whether the profile `profile` reads or accepts the token.
 /// @param verb "read" or "accept"
-/// @param refusal why the other profile does not; empty if it does
-/// @param isRefused whether the profile of the report refuses it
+/// @param refusal why it does not; empty if it does
+/// @param isRefused whether the profile of the report refuses the token
 inline std::string OtherProfileSentence(const std::string &profile, const std::string &verb, const std::string &refusal,
                                         bool isRefused) {
   std::string text = "The profile " + profile;

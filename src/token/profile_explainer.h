@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// `ProfileExplainer`, which reports the checks of an assertion that both profiles have.
+/// `ProfileExplainer`, which reports those checks of an assertion that both profiles have.
 
 #pragma once
 
@@ -19,7 +19,7 @@
 
 namespace SsoClient {
 
-/// What a report says if something that a check needs is missing.
+/// What a report states if something that a check needs is missing.
 namespace Missing {
 constexpr const char *ASSERTION = "There is no assertion.";
 constexpr const char *CONDITIONS = "There are no Conditions.";
@@ -28,7 +28,7 @@ constexpr const char *START = "The NotBefore of the Conditions cannot be read.";
 constexpr const char *END = "The NotOnOrAfter of the Conditions cannot be read.";
 } // namespace Missing
 
-/// Where the checks of a report are written. Everything must outlive the explainer.
+/// What the checks need, and where they are reported. Everything must outlive the explainer.
 struct ExplainContext {
   const Tarvel::Xml::Security::KeyInfoResolver &resolver;
   const VerifyOptions &options;
@@ -54,8 +54,8 @@ protected:
 
   /// Reads the assertion at the cursor, or the first one below it.
   virtual void Parse(NodeFilterIterator iterator, DeviationSink &sink) = 0;
-  /// Reads the assertion at the cursor in the other profile, and stops at the first deviation. Returns whether that
-  /// profile reads it, as a sentence, or an empty text if that is known.
+  /// Reads the assertion at the cursor in the other profile, and stops at the first deviation. Returns a sentence that
+  /// states whether that profile reads it; empty if that follows from the outcome in this profile.
   virtual std::string ReadOtherProfile(const NodeFilterIterator &iterator) = 0;
   /// The checks VALIDITY, CONFIRMATION and DELEGATION.
   virtual void ExplainProperties() = 0;

@@ -12,7 +12,7 @@ namespace SsoClient {
 
 /// What a parser could read of an assertion. If the assertion has the accepted form, that is everything.
 struct ReadAssertion {
-  /// Marks the dates of `record` as not read. Make it before a parser fills the record, which must outlive it.
+  /// Marks the dates of `record` as not read. A parser must fill the record later. The record must outlive this object.
   explicit ReadAssertion(SamlAssertionType &record);
 
   /// Whether this date of `assertion` could be read.

@@ -23,7 +23,7 @@ namespace {
 using Tarvel::System::DateTime;
 using Tarvel::Xml::ElementNode;
 
-/// Counts deviations, so that their texts are not made.
+/// Counts deviations. Their texts are not made.
 class CountingSink final : public DeviationSink {
 public:
   bool IsFull() const noexcept override { return true; }
@@ -48,7 +48,7 @@ const ElementNode *PlaceOf(const Saml2Confirmation &confirmation) {
   return confirmation.data ? confirmation.data : confirmation.element;
 }
 
-/// Null if none has been chosen.
+/// The confirmation that has been chosen; null if there is none.
 const ConfirmationDetails *ChosenConfirmation(const Saml2Assertion &assertion) {
   return assertion.common.Subject.SubjectConfirmation.isMethodKnown
              ? &assertion.details.confirmations[assertion.details.usedConfirmation]

@@ -1,9 +1,9 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// The rules of the profile SAML2 that differ from those of the profile STRICT: which confirmation is used, how long the token
-/// is valid, and for which audiences.
+/// The rules of the profile SAML2 that differ from those of the profile STRICT: which confirmation is used, how long
+/// the token is valid, and for which audiences.
 ///
-/// Like those in `token_checks.h`, each rule reports to a sink, and continues if the sink does not throw.
+/// Like the rules in `token_checks.h`, each of them reports to a sink, and continues if the sink does not throw.
 
 #pragma once
 
@@ -34,21 +34,22 @@ void CheckSaml2Properties(Saml2Assertion &assertion, const VerifyOptions &option
 Tarvel::System::DateTime CheckSaml2Validity(const Saml2Assertion &assertion, std::int64_t clockToleranceSec,
                                             DeviationSink &sink);
 
-/// Chooses the confirmation that is used: in document order, the first bearer confirmation that fits `options` and `now` or,
-/// if none fits, the first holder-of-key confirmation that does. If `options` require a kind and the assertion has it,
-/// only that kind is considered. Sets `details.usedConfirmation`, and the confirmation in `common.Subject`. If none fits,
-/// nothing is set, and each reason of the first confirmation of a known kind that is considered is reported.
+/// Chooses the confirmation that is used: the first bearer confirmation in document order that can be used with
+/// `options` at the time `now` or, if there is none, the first such holder-of-key confirmation. If `options` require a
+/// kind and the assertion has it, only that kind is considered. Sets `details.usedConfirmation` and the confirmation in
+/// `common.Subject`. If no confirmation can be used, nothing is set, and each reason against one of them is reported:
+/// against the first of a known kind that is considered or, if there is none, against the first.
 /// @return whether a confirmation was chosen
 bool ChooseConfirmation(Saml2Assertion &assertion, const VerifyOptions &options, const Tarvel::System::DateTime &now,
                         DeviationSink &sink);
 
-/// Checks that no session has ended, and that none ends before the token starts. A confirmation must have been chosen, or its
-/// dates are not considered.
+/// Checks that no session has ended, and that none ends before the token starts. If a confirmation has been chosen, the
+/// token does not start before that confirmation can be used.
 void CheckSessions(const Saml2Assertion &assertion, std::int64_t clockToleranceSec, const Tarvel::System::DateTime &now,
                    DeviationSink &sink);
 
-/// Checks that the delegate of the chosen confirmation, if there is one, is the last delegate of the delegation restriction
-/// or, if there is no restriction, the subject itself.
+/// Checks that the delegate of the chosen confirmation, if there is one, is the last delegate of the delegation
+/// restriction or, if there is no restriction, the subject itself.
 void CheckSaml2Delegation(const Saml2Assertion &assertion, DeviationSink &sink);
 
 /// Decides which confirmations of an assertion can be used. The assertion and the options must outlive it.
@@ -66,7 +67,7 @@ public:
   /// Reports each reason for which the confirmation at `index` cannot be used.
   void Check(std::size_t index, DeviationSink &sink) const;
 
-  /// The first of these reasons; empty if the confirmation can be used.
+  /// The first reason that `Check` reports for this confirmation; empty if it can be used.
   boost::optional<Deviation> GetRefusal(std::size_t index) const;
 
 private:
@@ -86,7 +87,7 @@ private:
 /// The time in which a token can be used.
 struct TokenPeriod {
   Tarvel::System::DateTime start; ///< the first moment
-  Tarvel::System::DateTime end;   ///< the first moment after it
+  Tarvel::System::DateTime end;   ///< the first moment after the last one
 };
 
 /// The time in which the conditions hold, the chosen confirmation can be used, and no session has ended.

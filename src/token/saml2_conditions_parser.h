@@ -10,9 +10,9 @@
 
 namespace SsoClient {
 
-/// Reads a `saml:Conditions`: restrictions in any order. Without a `NotBefore`, the token is valid from its `IssueInstant`,
-/// which must have been read. A condition that is not known is refused, because nobody can say whether it is met (SAML 2.0
-/// core, section 2.5.1.1).
+/// Reads a `saml:Conditions`: restrictions in any order. Without a `NotBefore`, the token is valid from its
+/// `IssueInstant`, which must have been read. A condition that is not known is refused, because it cannot be checked
+/// (SAML 2.0 core, section 2.5.1.1).
 void ParseSaml2ConditionsElement(NodeFilterIterator &iterator, Saml2Assertion &assertion,
                                  DeviationSink &sink = ThrowingSink());
 

@@ -24,8 +24,8 @@ using Tarvel::Xml::ElementNode;
 using Tarvel::Xml::Node;
 using Tarvel::Xml::Security::Canonicalizer;
 
-/// Receives the canonical forms one after the other. Together they have a limit: each repeats the namespaces that it uses,
-/// so they can be much longer than the document.
+/// Receives the canonical forms one after the other. Together they have a limit: each repeats the namespaces that it
+/// uses, so they can be much longer than the document.
 class ValueWriter final : public Tarvel::Writer {
 public:
   void Write(std::string_view bytes) override {
@@ -115,7 +115,7 @@ SamlAttribute ReadAttribute(const ElementNode &element, ValueReader &reader) {
   return attribute;
 }
 
-/// Empties the values with a signature. It could be that of a bearer token, which a report must not repeat.
+/// Empties the values with a signature: it could belong to a bearer token, which a report must not repeat.
 void RemoveSignatures(std::vector<SamlAttribute> &attributes) {
   for (SamlAttribute &attribute : attributes) {
     for (AttributeValue &value : attribute.values) {

@@ -20,17 +20,18 @@ constexpr std::size_t MAX_XML_VALUE_BYTES = 32u * 1024 * 1024;
 /// The identifier in `element`, which a parser has accepted.
 NameId ReadNameId(const Tarvel::Xml::ElementNode &element);
 
-/// The attributes of `statement`, which a parser has accepted, with the values that are XML.
-/// @throws ParseException when these values are longer than `MAX_XML_VALUE_BYTES`.
-/// @throws Tarvel::Xml::Security::XmlSecurityException when such a value has no canonical form. An assertion with a valid
-///         signature has one.
+/// The attributes of `statement`, which a parser has accepted. Values that contain elements are read in canonical form.
+/// @throws ParseException when the canonical forms together are longer than `MAX_XML_VALUE_BYTES`.
+/// @throws Tarvel::Xml::Security::XmlSecurityException when a value has no canonical form. In an assertion with a valid
+///         signature, each value has one.
 std::vector<SamlAttribute> ReadAttributes(const AttributeStatementType &statement);
 
-/// The details of an assertion with its attributes. They are moved.
-/// @throws like `ReadAttributes`.
+/// Reads the attributes of `assertion`, and moves all its details out of it.
+/// @throws what `ReadAttributes` throws.
 TokenDetails TakeDetails(Saml2Assertion &assertion);
 
-/// The same for an assertion that is not verified. If the attributes cannot be read, they are left out.
+/// The same for an assertion that is not verified. If the attributes cannot be read, they are left out. The text of a
+/// value that has elements with a signature is empty.
 TokenDetails TakeDetailsOfClaims(Saml2Assertion &assertion);
 
 } // namespace SsoClient

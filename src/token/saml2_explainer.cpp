@@ -24,7 +24,7 @@ using Tarvel::System::DateTime;
 
 constexpr const char *NOT_CHOSEN = "No confirmation can be used.";
 
-/// The first end of a session; empty if no statement has one.
+/// The earliest end of a session; empty if no statement has one.
 boost::optional<DateTime> SessionEnd(const TokenDetails &details) {
   boost::optional<DateTime> end;
   for (const AuthnStatementDetails &statement : details.authnStatements) {
@@ -182,7 +182,7 @@ void Saml2Explainer::ExplainAudience() {
   m_recorder.Summarize(SummaryOfAudience(JoinRestrictions(restrictions)));
 }
 
-/// With a confirmation and with sessions, a token may end earlier than its conditions.
+/// The dates of a confirmation and of sessions can make the time of validity shorter than that of the conditions.
 void Saml2Explainer::SetClaimsOfPeriod(const TokenFacts &facts) {
   UnverifiedClaims &claims = m_report.claims;
   if (m_isConfirmationChosen) {

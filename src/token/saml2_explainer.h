@@ -13,7 +13,7 @@
 
 namespace SsoClient {
 
-/// The record of the profile. It is a base, so that it exists before the explainer that marks it.
+/// The record of the profile. It is a base class, so it is constructed before `ProfileExplainer`, which changes it.
 struct Saml2Record {
   Saml2Assertion saml2;
 };

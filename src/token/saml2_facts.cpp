@@ -81,8 +81,8 @@ void AppendQualifier(std::string &domain, std::string_view name, const boost::op
   }
 }
 
-/// Whether `domain` could be mistaken for one that states a format. Principals are compared without letter case, and some
-/// letters beyond ASCII become ASCII letters in upper case.
+/// Whether `domain` could be mistaken for one that states a format. Principals are compared without letter case, and
+/// some letters beyond ASCII become ASCII letters in upper case.
 bool StatesFormat(const std::string &domain) {
   const std::string upperCase = Tarvel::StringUtil::ToUpper(domain);
   return upperCase.compare(0, NAME_ID.size(), Tarvel::StringUtil::ToUpper(std::string(NAME_ID))) == 0;
@@ -167,7 +167,7 @@ std::set<std::string> TakeCommonAudiences(std::vector<std::set<std::string>> &&r
   if (restrictions.empty()) {
     return common;
   }
-  // The smallest set is compared with the others, so the number of comparisons is that of all audiences at most.
+  // Each audience of the smallest set is looked up in the other sets, so there are fewer look-ups than audiences.
   const auto smallest =
       std::min_element(restrictions.begin(), restrictions.end(),
                        [](const auto &left, const auto &right) { return left.size() < right.size(); });

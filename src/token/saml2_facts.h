@@ -19,9 +19,9 @@ namespace SsoClient {
 
 /// The principal with this identifier.
 ///
-/// A user principal name `name@domain` without qualifiers is split at its last at-sign, like in the profile STRICT, unless
-/// its domain begins with "nameid:". Any other identifier becomes a principal whose name is the value, and whose domain
-/// states the format and the qualifiers: "nameid:", the key of the format, and ";name-qualifier=" and
+/// A user principal name `name@domain` without qualifiers is split at its last at-sign, as in the profile STRICT,
+/// unless its domain begins with "nameid:". Any other identifier becomes a principal whose name is the value. The
+/// domain states the format and the qualifiers: "nameid:", the key of the format, and ";name-qualifier=" and
 /// ";sp-name-qualifier=", each with its value, if they are there. The keys are "unspecified" (also if there is no
 /// format), "email", "x509-subject", "windows", "kerberos", "entity", "persistent", "transient" and "upn", and
 /// "format=" with the URI for every other format. In URI and qualifiers, every octet except lower-case letters, digits
@@ -33,8 +33,8 @@ PrincipalId ToPrincipalId(const NameId &nameId);
 /// "unspecified" are the same.
 bool IsSameIdentifier(const NameId &left, const NameId &right);
 
-/// The content of `assertion` without its audiences. Its confirmation must have been chosen. `assertion.common` is moved from.
-/// The dates are those within which the token can be used.
+/// The content of `assertion` without its audiences. Its confirmation must have been chosen. Values are moved out of
+/// `assertion.common`. The dates are those within which the token can be used.
 /// @throws ParseException when a group or the solution attribute is malformed.
 TokenFacts TakeSaml2Facts(Saml2Assertion &assertion);
 
@@ -44,9 +44,9 @@ void TakeSaml2Subject(Saml2Assertion &assertion, TokenFacts &facts);
 void TakeSaml2Attributes(Saml2Assertion &assertion, TokenFacts &facts, DeviationSink &sink);
 void TakeSaml2Conditions(const Saml2Assertion &assertion, TokenFacts &facts);
 
-/// The audiences that are in each of `restrictions`, so each of them meets all restrictions. If there is none, the only
-/// entry is a text that names all restrictions, and that no address equals. Empty if there are no restrictions. Takes
-/// linear time, and moves the audiences, because there may be very many.
+/// The audiences that are in each of `restrictions`, so each of them meets all restrictions. If there is no such
+/// audience, the only entry is a text that lists all restrictions, and that no address equals. Empty if there are no
+/// restrictions. There may be very many audiences, so they are moved, and there are fewer look-ups than audiences.
 std::set<std::string> TakeCommonAudiences(std::vector<std::set<std::string>> &&restrictions);
 
 } // namespace SsoClient

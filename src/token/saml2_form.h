@@ -22,7 +22,7 @@
 
 namespace SsoClient {
 
-/// Attributes in namespaces other than that of the standard.
+/// How attributes in namespaces other than that of the standard are treated.
 enum class ForeignAttributes { REFUSED, IGNORED };
 
 /// The type of the standard with that name.
@@ -33,8 +33,8 @@ constexpr QNameView SamlType(std::string_view name) noexcept {
 /// The type of elements whose text is a URI.
 constexpr QNameView ANY_URI_TYPE(Namespaces::XS, "anyURI");
 
-/// `element` must have all required attributes without a prefix and may have the optional ones. An `xsi:type` must be one
-/// of `types`, of which the first is the one that the schema declares. Locations of schemas are ignored.
+/// `element` must have all required attributes and may have the optional ones. An `xsi:type` must be one of `types`.
+/// The schema declares the first of them. Locations of schemas are ignored.
 void RequireSchemaAttributes(const Tarvel::Xml::ElementNode &element, std::initializer_list<QNameView> types,
                              std::initializer_list<QNameView> required, std::initializer_list<QNameView> optional,
                              DeviationSink &sink, ForeignAttributes foreign = ForeignAttributes::REFUSED);
@@ -46,17 +46,19 @@ boost::optional<std::string> ReadOptionalText(const Tarvel::Xml::ElementNode &el
 boost::optional<Tarvel::System::DateTime> ReadOptionalDate(const Tarvel::Xml::ElementNode &element,
                                                            std::string_view name, DeviationSink &sink);
 
-/// Takes the element of that name, whose content is a URI and which has no attributes. Returns whether `uri` was set.
+/// Reads the element of that name. It must contain one text, a URI, and have no attributes of its own. Returns whether
+/// `uri` was set.
 bool ParseUriElement(NodeFilterIterator &iterator, std::string_view localName, std::string &uri, DeviationSink &sink);
 
 /// Whether the element at the cursor is in the standard's namespace and has that name.
 bool IsSamlElement(const NodeFilterIterator &iterator, std::string_view localName) noexcept;
 
-/// If the node at the cursor is an element that the standard allows and this profile does not read, refuses it by its name
-/// and skips it: everything that is encrypted, and identifiers that are not names. Returns whether it was such an element.
+/// If the node at the cursor is an element that the standard allows and this profile does not read, refuses and skips
+/// it. Such elements have encrypted content, or are a `saml:BaseID`. Returns whether it was such an element.
 bool TryRefuseUnsupported(NodeFilterIterator &iterator, DeviationSink &sink);
 
-/// Refuses the node at the cursor, for which there is no place in its parent, and skips it.
+/// Refuses and skips the node at the cursor, which its parent must not contain.
+/// @param allowed what the parent may contain
 void RefuseContent(NodeFilterIterator &iterator, std::string_view allowed, DeviationSink &sink);
 
 /// Refuses each node from the cursor on.
@@ -65,8 +67,9 @@ void RefuseFurtherContent(NodeFilterIterator iterator, DeviationSink &sink);
 /// Refuses and skips an element that must not occur again.
 void RefuseRepeated(NodeFilterIterator &iterator, DeviationSink &sink);
 
-/// Refuses the element at the cursor if there already are `count` elements of its kind and there may not be more. Returns
-/// whether there may be.
+/// Refuses the element at the cursor if there are `MAX_REPEATED_ELEMENTS` of its kind before it. Returns whether it is
+/// allowed.
+/// @param count how many elements of its kind are before it
 bool RequireRoomForElement(const NodeFilterIterator &iterator, std::size_t count, DeviationSink &sink);
 
 } // namespace SsoClient

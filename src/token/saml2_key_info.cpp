@@ -74,7 +74,7 @@ std::optional<NamedCurve> FindCurve(std::string_view uri) {
   return uri == "urn:oid:1.3.132.0.35" ? std::optional(NamedCurve::P521) : std::nullopt;
 }
 
-/// No key if the curve is not written by its name, or is another one.
+/// Returns no key if the curve is not written by its name, or is not one of `NamedCurve`.
 SubjectPublicKey ParseEcKeyValue(const NodeFilterIterator &keyValue, DeviationSink &sink) {
   NodeFilterIterator child = keyValue.GetChild();
   const ElementNode *const named = IteratorToElement(child);
@@ -95,7 +95,7 @@ SubjectPublicKey ParseEcKeyValue(const NodeFilterIterator &keyValue, DeviationSi
   return {};
 }
 
-/// A cursor on the first child of the element at `parent` for which `isWanted` is true; otherwise past the end.
+/// A cursor on the first child of the element at `parent` for which `isWanted` is true; past the end if there is none.
 template <typename IsWanted>
 NodeFilterIterator FindChild(const NodeFilterIterator &parent, const IsWanted &isWanted) {
   NodeFilterIterator child = parent.GetChild();

@@ -11,15 +11,15 @@
 
 namespace SsoClient {
 
-/// Reads the `ds:KeyInfo` at the cursor. The key is that of its first certificate or that of its first key value
-/// (`RSAKeyValue`, or `ECKeyValue` with a named curve). If both are there, they must be the same. Everything else in a
-/// `ds:KeyInfo` is ignored.
+/// Reads the `ds:KeyInfo` at the cursor. The key is that of its first certificate or, if there is none, its first key
+/// value (`RSAKeyValue`, or `ECKeyValue` with a named curve). If there are both, their keys must be the same.
+/// Everything else in a `ds:KeyInfo` is ignored.
 ///
 /// If there is no key, or a key value of a size or a curve with which no signature is accepted, `details.publicKey` stays
 /// empty. The key of a certificate may have any kind and size, as in the profile STRICT.
 ///
-/// Returns whether there is a certificate or such a key value, even if it is refused. Keys take long to read, so the
-/// caller should not read another `ds:KeyInfo` then.
+/// Returns whether there is a certificate or such a key value, even if it is refused. If so, the caller should not read
+/// another `ds:KeyInfo`, because keys take long to read.
 bool ParseKeyInfo(const NodeFilterIterator &iterator, ConfirmationDetails &details,
                   DeviationSink &sink = ThrowingSink());
 

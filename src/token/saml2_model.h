@@ -17,8 +17,8 @@
 
 namespace SsoClient {
 
-/// How many elements of each of these kinds an assertion may have: `SubjectConfirmation`, `AuthnStatement`, `AudienceRestriction`.
-/// Their records are large, so without a limit a small document could take much memory.
+/// How many elements of each of these kinds an assertion may have: `SubjectConfirmation`, `AuthnStatement`,
+/// `AudienceRestriction`. Their records are large, so without a limit a small document could take much memory.
 constexpr std::size_t MAX_REPEATED_ELEMENTS = 1000;
 
 /// What belongs to the confirmation of the same index in `TokenDetails::confirmations`.
@@ -33,12 +33,13 @@ struct Saml2Confirmation {
 
 /// An assertion in the profile SAML2. It exists only while a token is made. Pointers are valid as long as the tree.
 struct Saml2Assertion {
-  /// What both profiles have. The parser fills all but the confirmation of the subject, which `ChooseConfirmation` sets:
-  /// `AuthnStatement` stays empty; a missing `NotBefore` is the `IssueInstant`; the audiences of all restrictions are in
-  /// `details` only; delegates have no qualifiers here, but their elements have; `values` has only values that are texts.
+  /// What both profiles have. The parser fills it, but `ChooseConfirmation` sets the confirmation of the subject. Other
+  /// differences: `AuthnStatement` stays empty; a missing `NotBefore` is the `IssueInstant`; the audiences of all
+  /// restrictions are only in `details`; the qualifiers of delegates are only in their elements; `values` has only
+  /// values that are texts.
   SamlAssertionType common;
-  /// Everything else. `attributes` stays empty: `ReadAttributes` reads them again when they are asked for, because most
-  /// callers never ask.
+  /// Everything else. `attributes` stays empty: `ReadAttributes` reads them again if a caller wants them, because most
+  /// callers do not.
   TokenDetails details;
   std::vector<Saml2Confirmation> confirmations; ///< one for each of `details.confirmations`
 };

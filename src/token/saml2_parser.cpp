@@ -16,7 +16,7 @@ namespace {
 
 using Tarvel::Xml::ElementNode;
 
-/// The assertion at the cursor. If another element is there, that is refused, and the first assertion below it is returned.
+/// The assertion at the cursor. If another node is there, it is refused, and the result is that of `FindAssertion`.
 const ElementNode *FindRoot(const NodeFilterIterator &iterator, DeviationSink &sink) {
   NodeFilterIterator next = iterator;
   const bool isEncrypted = IsSamlElement(iterator, "EncryptedAssertion") && TryRefuseUnsupported(next, sink);

@@ -44,7 +44,7 @@ bool ParseAnyValue(NodeFilterIterator &iterator, std::string &value, DeviationSi
   return !isEmpty && !isXml && RequireTextualContent(taken, value, sink);
 }
 
-/// Groups and the solution flag decide about access, so a value of them that is not a text is refused.
+/// Groups and the solution flag decide about access, so each of their values must be a text.
 AttributeValueParser FindValueParser(const AttributeType &attribute) {
   return SamlAttributeIsGroupIdentity(attribute) || SamlAttributeIsSolution(attribute) ? ParseTextValue : ParseAnyValue;
 }
@@ -67,7 +67,7 @@ void ParseAttributeStatement(NodeFilterIterator &iterator, boost::optional<Attri
   RequireSchemaAttributes(*IteratorToElement(iterator), {SamlType("AttributeStatementType")}, {}, {}, sink);
   if (!statement) {
     statement.emplace();
-    // Of all statements at once, because memory that grows with each of them would be copied each time.
+    // Reserves memory for all statements: if it grew with each of them, all attributes would be copied each time.
     std::size_t count = 0;
     for (NodeFilterIterator sibling = iterator; sibling.node; sibling.MoveToSibling()) {
       count += IsSamlElement(sibling, "AttributeStatement") ? CountPossibleAttributes(*IteratorToElement(sibling)) : 0;

@@ -10,8 +10,8 @@
 
 namespace SsoClient {
 
-/// Reads a `saml:Advice`, if one is at the cursor: each `RSAAdvice` in it. Other elements are ignored, because an advice may
-/// be ignored (SAML 2.0 core, section 2.6.1).
+/// Reads each `RSAAdvice` in a `saml:Advice`, if one is at the cursor. Other elements in it are ignored, which SAML 2.0
+/// core, section 2.6.1 allows.
 void TryParseSaml2AdviceElement(NodeFilterIterator &iterator, boost::optional<AdviceType> &advice,
                                 DeviationSink &sink = ThrowingSink());
 

@@ -32,7 +32,7 @@ boost::optional<std::string> ReadQualifier(const ElementNode &element, std::stri
   return value;
 }
 
-/// Reads all of the element at the cursor except its `Format`.
+/// Reads the element at the cursor except its `Format`, which the caller has read into `exact`.
 void ParseName(const NodeFilterIterator &iterator, NameIDType &nameId, NameId &exact, DeviationSink &sink) {
   const ElementNode &element = *IteratorToElement(iterator);
   RequireSchemaAttributes(
@@ -52,8 +52,8 @@ void ParseMethod(const ElementNode &element, Saml2Confirmation &confirmation, Co
   confirmation.type = FindConfirmationType(details.method);
 }
 
-/// Reads the content of the data of a known method: the first key. The standard allows any elements and text, and
-/// everything else is ignored. A key of a bearer confirmation is not read.
+/// Reads the first key in the data of a confirmation whose method is known. The standard allows any other elements and
+/// text there, which are ignored. A key of a bearer confirmation is not read.
 void ParseContent(NodeFilterIterator child, Saml2Confirmation &confirmation, ConfirmationDetails &details,
                   DeviationSink &sink) {
   for (bool isKeyRead = false; child.node; child.MoveToSibling()) {
@@ -88,7 +88,7 @@ void ParseData(NodeFilterIterator &iterator, Saml2Confirmation &confirmation, Co
   iterator.MoveToSibling();
 }
 
-/// Reads the name of the party that is to confirm.
+/// Reads the name of the party that must confirm.
 void ParseConfirmingName(NodeFilterIterator &iterator, Saml2Confirmation &confirmation, ConfirmationDetails &details,
                          DeviationSink &sink) {
   NameIDType name;

@@ -62,7 +62,7 @@ public:
   /// The subject's identifier exactly as written.
   NameId GetNameId() const;
 
-  /// Which of the token's confirmations the verification chose, in document order.
+  /// The index, in document order, of the confirmation that the verification chose.
   std::size_t GetUsedConfirmation() const noexcept { return m_usedConfirmation; }
 
   /// @throws InvalidSignatureException unless `signature` verifies with one of the keys of `resolver`.
@@ -79,7 +79,7 @@ private:
 
   std::string m_xml;
   TokenFacts m_facts;
-  boost::optional<NameId> m_nameId; // empty in the profile STRICT, where the subject states it
+  boost::optional<NameId> m_nameId; // empty in the profile STRICT: `m_facts.subject` has it
   std::size_t m_usedConfirmation = 0;
 };
 

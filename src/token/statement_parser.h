@@ -33,9 +33,9 @@ void ParseAuthnStatementElement(NodeFilterIterator &iterator, AuthnStatementType
 void ParseAuthnContextElement(NodeFilterIterator &iterator, AuthnContextType &context,
                               DeviationSink &sink = ThrowingSink());
 
-/// An upper limit of the number of SAML attributes in `statement`: it counts each element with at least one XML attribute.
-/// With it, memory is reserved for all of them at once, because a sequence that grows step by step needs up to three times
-/// the memory.
+/// An upper limit of the number of SAML attributes in `statement`: it counts each element with at least one XML
+/// attribute. Callers reserve memory for all of them at once, because a sequence that grows step by step needs up to
+/// three times the memory.
 std::size_t CountPossibleAttributes(const Tarvel::Xml::ElementNode &statement);
 
 /// Reads a `saml:AttributeStatement` and adds its attributes to those that `statement` has.

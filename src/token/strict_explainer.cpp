@@ -39,7 +39,7 @@ std::string StrictExplainer::ReadOtherProfile(const NodeFilterIterator &iterator
     m_other = boost::none;
   }
   if (m_read.isFormAccepted) {
-    return {}; // what the profile STRICT reads, the profile SAML2 reads, too
+    return {}; // the profile SAML2 reads all that the profile STRICT reads
   }
   if (m_other) {
     m_recorder.ReplaceFirstRemedy(RemedyForOtherForm());

@@ -11,13 +11,13 @@
 
 namespace SsoClient {
 
-/// The record of the profile. It is a base, so that it exists before the explainer that marks it.
+/// The record of the profile. It is a base class, so it is constructed before `ProfileExplainer`, which changes it.
 struct StrictRecord {
   SamlAssertionType strict;
 };
 
-/// If a check whose rules the profiles do not share has failed, also reports whether the profile SAML2 accepts the token
-/// there.
+/// The rules of some checks differ between the profiles. If such a check fails, its summary also states whether the
+/// profile SAML2 accepts the token in this check.
 class StrictExplainer final : private StrictRecord, public ProfileExplainer {
 public:
   explicit StrictExplainer(const ExplainContext &context) : ProfileExplainer(context, strict) {}
@@ -35,7 +35,8 @@ private:
   void ExplainAudience(const std::set<std::string> &audience);
   void SetDetails();
 
-  /// Summarizes a check. If it has failed, `rule` is what the profile SAML2 checks there.
+  /// Sets the summary of a check. If the check has failed, the summary also states whether the profile SAML2 accepts
+  /// the token, that is whether `rule` does not throw.
   template <typename Rule>
   void SummarizeBoth(const std::string &summary, const Rule &rule);
 

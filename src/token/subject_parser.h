@@ -22,7 +22,7 @@ constexpr QNameView KEY_INFO_CONFIRMATION_DATA_TYPE(Namespaces::SAML, "KeyInfoCo
 /// The kind of confirmation whose method has this URI; empty for other methods.
 boost::optional<SamlToken::ConfirmationType> FindConfirmationType(std::string_view method);
 
-/// Reads attributes and text of an element of the type NameIDType, whatever its name. The cursor must be on an element.
+/// Reads attributes and text of an element of the type NameIDType with any name. The cursor must be on an element.
 void ParseNameIDType(NodeFilterIterator &iterator, NameIDType &nameId, DeviationSink &sink = ThrowingSink());
 
 /// Reads a `saml:Issuer`.

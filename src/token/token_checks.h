@@ -40,7 +40,7 @@ Tarvel::System::DateTime CheckValidity(const ConditionsType &conditions, const P
 void CheckSubjectValidity(const SamlAssertionType &assertion, DeviationSink &sink);
 void CheckDelegation(const SamlAssertionType &assertion, DeviationSink &sink);
 
-/// Refuses the delegate of a confirmation: there is no delegation restriction, or its last delegate is another one.
+/// Refuse the delegate of a confirmation: there is no delegation restriction, or its last delegate is another one.
 void RefuseUnexpectedDelegate(const NameIDType &delegate, DeviationSink &sink);
 void RefuseOtherDelegate(const NameIDType &delegate, std::string_view lastDelegate, DeviationSink &sink);
 
@@ -55,7 +55,7 @@ struct TimeLimit {
 void CheckStart(const TimeLimit &start, const Tarvel::System::DateTime &now, std::int64_t clockToleranceSec,
                 DeviationSink &sink);
 
-/// Checks that `now` is before `end`, with the tolerance.
+/// Checks that `now` is before `end` plus the tolerance.
 void CheckEnd(const TimeLimit &end, const Tarvel::System::DateTime &now, std::int64_t clockToleranceSec,
               DeviationSink &sink);
 

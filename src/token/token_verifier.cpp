@@ -17,7 +17,7 @@ namespace {
 using Tarvel::Xml::ElementNode;
 using Tarvel::Xml::Security::KeyInfoResolver;
 
-/// Refuses an option that the strict form cannot fulfil: a check that cannot be made must not be left out silently.
+/// Refuses an option that the profile STRICT cannot check, so that the check is not left out silently.
 void RequireSaml2(bool isSet, const char *option) {
   if (isSet) {
     throw Tarvel::InvalidArgumentException(std::string("VerifyOptions::") + option + " needs the profile SAML2");

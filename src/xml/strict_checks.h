@@ -53,8 +53,8 @@ void RequireElementAttributesNames(const Tarvel::Xml::ElementNode &element,
                                    std::initializer_list<std::string_view> optional,
                                    DeviationSink &sink = ThrowingSink());
 
-/// The same, but attributes are compared by qualified name, and others are not refused if `isIgnored` returns true for
-/// their names.
+/// The same, but attributes are compared by qualified name, and other attributes are ignored if `isIgnored` returns
+/// true for their names.
 void RequireElementAttributesQNames(const Tarvel::Xml::ElementNode &element, std::initializer_list<QNameView> required,
                                     std::initializer_list<QNameView> optional, DeviationSink &sink = ThrowingSink(),
                                     bool (*isIgnored)(const QNameView &name) = nullptr);

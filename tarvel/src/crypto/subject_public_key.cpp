@@ -43,7 +43,7 @@ Curve Describe(NamedCurve curve) {
   return {"P-521", KeyKind::EC_P521, 66};
 }
 
-/// Null if the octets without the zeros at the beginning are more than `maxBits`.
+/// The number that the octets are. Null if they have more than `maxBits` bits after the zeros at the beginning.
 BignumHandle ReadNumber(const std::vector<std::uint8_t> &octets, std::size_t maxBits) {
   const auto first = std::find_if(octets.begin(), octets.end(), [](std::uint8_t octet) { return octet != 0; });
   const auto count = static_cast<std::size_t>(octets.end() - first);
