@@ -60,7 +60,7 @@ std::string SummaryOfConfirmations(const Saml2Assertion &assertion, const Verify
   for (std::size_t index = 0; index < assertion.confirmations.size() && IsShown(text); ++index) {
     if (!isChosen || index != assertion.details.usedConfirmation) {
       const boost::optional<Deviation> refusal = choice.GetRefusal(index);
-      text += " Not " + NameOf(assertion, index) + ": " + (refusal ? refusal->message : "another comes first") + ".";
+      text += " Not " + NameOf(assertion, index) + ": " + (refusal ? refusal->message : "another is preferred") + ".";
     }
   }
   return text;

@@ -69,6 +69,9 @@ std::string ForConfirmation(const Finding &finding) {
   if (finding.wanted == "a certificate or an RSA or EC public key") {
     return "Ask the service's operator to put the certificate or the public key of the holder into the confirmation.";
   }
+  if (finding.wanted == "no key") {
+    return "Ask the service's operator to issue bearer confirmations without a key, or holder-of-key confirmations.";
+  }
   if (finding.attribute.empty() || finding.attribute == "SessionNotOnOrAfter") {
     return "Ask the service's operator to issue tokens whose confirmation and session can be used while they are "
            "valid.";
@@ -172,8 +175,7 @@ std::string RemedyFor(const TokenReport &report, Check check, const Finding &fin
 
 std::string RemedyForOtherForm() {
   return "Verify the token with the profile SAML2, which reads it, or ask the service's operator to issue tokens of "
-         "the "
-         "accepted form.";
+         "the accepted form.";
 }
 
 std::string RemedyForSurroundings(bool hasSaml2) {

@@ -119,7 +119,7 @@ SamlAttribute ReadAttribute(const ElementNode &element, ValueReader &reader) {
 void RemoveSignatures(std::vector<SamlAttribute> &attributes) {
   for (SamlAttribute &attribute : attributes) {
     for (AttributeValue &value : attribute.values) {
-      if (value.isXml && value.text.find("SignatureValue") != std::string::npos) {
+      if (value.text.find("SignatureValue") != std::string::npos) {
         value.text.clear();
       }
     }

@@ -247,7 +247,7 @@ TokenDetails DetailsOf(const SamlToken &token) {
   TokenDetails details = GetTokenDetails(token);
   for (SamlAttribute &attribute : details.attributes) {
     for (AttributeValue &value : attribute.values) {
-      value.text = value.isXml && value.text.find("SignatureValue") != std::string::npos ? std::string() : value.text;
+      value.text = value.text.find("SignatureValue") != std::string::npos ? std::string() : value.text;
     }
   }
   return details;

@@ -68,7 +68,7 @@ TEST_F(ExplainSaml2, SaysWhichConfirmationIsUsedAndWhyTheOthersAreNot) {
       "2026-01-03T00:00:00.000Z; Recipient \"https://sp.example/acs\", not checked; InResponseTo \"_request\", not "
       "checked; Address \"192.0.2.7\", not checked. Not 1 (urn:oasis:names:tc:SAML:2.0:cm:sender-vouches): Unknown "
       "subject confirmation method: 'urn:oasis:names:tc:SAML:2.0:cm:sender-vouches'. Not 2 (bearer): The subject "
-      "confirmation has expired at: 2026-01-01T12:00:00.000Z. Not 3 (holder-of-key): another comes first.",
+      "confirmation has expired at: 2026-01-01T12:00:00.000Z. Not 3 (holder-of-key): another is preferred.",
       Summary(ExplainIn(RichToken()), Check::CONFIRMATION));
 }
 
