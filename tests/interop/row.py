@@ -1,5 +1,5 @@
 # SPDX-License-Identifier: Apache-2.0
-"""One row of the table: an operation at an endpoint, what must come of it, and the changed copies that must be refused."""
+"""One row of the table: an operation at an endpoint, its expected result, and the changed copies that must be refused."""
 
 import dataclasses
 
@@ -13,7 +13,7 @@ STRICT_HINT = "--profile saml2"
 
 @dataclasses.dataclass
 class Outcome:
-    """What a row came to. A row that is as expected has no failures."""
+    """The result of a row. A row that is as expected has no failures."""
 
     row: "Row"
     failures: list
