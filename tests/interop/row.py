@@ -24,7 +24,7 @@ class Outcome:
 @dataclasses.dataclass
 class Row:
     """`request_changes` are the changes of the request that must be refused, by name, each with the expected exit code and
-    faults. `code` is the expected exit code, and `fault` the fault, of a row that is refused for a `reason`."""
+    faults. `code` is the expected exit code of the row. If the row is refused, `fault` is the fault, and `reason` the reason."""
 
     operation: str
     confirmation: str

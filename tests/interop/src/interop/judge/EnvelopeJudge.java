@@ -136,7 +136,7 @@ final class EnvelopeJudge {
     };
   }
 
-  /** The elements that must be signed: no more and no fewer. */
+  /** The elements that must be signed. No other element may be signed. */
   private static Set<Element> mustBeSigned(Document document) {
     Set<Element> wanted = Collections.newSetFromMap(new IdentityHashMap<>());
     Element envelope = document.getDocumentElement();
