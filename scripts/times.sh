@@ -5,11 +5,11 @@
 step_rows=()
 failed_steps=()
 
-# What a step returns that cannot run on this machine, and has said why.
+# The exit code of a step that cannot run on this machine. The step itself prints the reason.
 SKIPPED=77
 
 # run_step NAME COMMAND…: runs the command in a subshell, which ends at the first command that fails. Always succeeds itself;
-# a step that failed is added to failed_steps. A step that is skipped did not fail, and did not pass.
+# a step that failed is added to failed_steps. A skipped step has neither passed nor failed.
 run_step() {
   local name="$1" started=$SECONDS result=passed status
   shift

@@ -5,7 +5,8 @@ import pathlib
 import subprocess
 import threading
 
-# Names that neither US-ASCII nor ISO-8859-1 has, as a user, in a password and as a group.
+# A user, a password and a group that US-ASCII cannot write. The user and the group have a character that ISO-8859-1 cannot
+# write, either.
 USER = "jürgen€@corp.example"
 PASSWORD = "paßwörter"
 GROUPS = [{"name": "Kölner €", "domain": "corp"}, {"name": "users", "domain": ""}]
@@ -14,7 +15,7 @@ CERTIFICATE_SUBJECT = "CN=Jürgen €,O=Beispiel"
 
 START_SEC = 120  # how long the service may take to start
 
-# A version 3 certificate, which WS-SecurityPolicy's WssX509V3Token10 requires, has extensions.
+# WS-SecurityPolicy's WssX509V3Token10 requires a certificate of version 3, which has extensions.
 EXTENSIONS = "basicConstraints=CA:FALSE\n"
 
 
@@ -26,7 +27,7 @@ def openssl(folder, *arguments):
 
 
 def make_certificate(folder, name, subject, extensions=EXTENSIONS):
-    """A key and a certificate of the authority: NAME.key and NAME.pem."""
+    """Makes a key, and a certificate that the authority issues for it: NAME.key and NAME.pem."""
     (folder / f"{name}.ext").write_text(extensions, encoding="utf-8")
     openssl(folder, "req", "-newkey", "rsa:2048", "-nodes", "-utf8", "-subj", subject, "-keyout", f"{name}.key", "-out",
             f"{name}.csr")
@@ -54,7 +55,7 @@ def prepare(folder):
 
 
 class TokenService:
-    """The running service. The JVM ends when its standard input does, so at the latest with this process."""
+    """The running service. The JVM ends when its standard input ends, at the latest with this process."""
 
     def __init__(self, build, folder):
         self._log = open(folder / "service.log", "w", encoding="utf-8")

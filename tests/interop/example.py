@@ -13,7 +13,7 @@ OUTPUT = re.compile(f"acquired: {TOKEN}renewed: {TOKEN}valid\nexchanged: {TOKEN}
 
 
 def failures(root, build, folder, url):
-    """Compiles and runs the program. Returns what is wrong, or nothing."""
+    """Compiles and runs the program. Returns a list of what is wrong, which is empty if nothing is."""
     libraries = [build.resolve() / "src", build.resolve() / "tarvel"]
     paths = [option for library in libraries for option in (f"-L{library}", f"-Wl,-rpath,{library}")]
     compiled = subprocess.run(

@@ -20,7 +20,7 @@ def next_digit(pattern):
     return lambda message: compiled.sub(lambda match: match[1] + bytes([48 + (match[2][0] - 47) % 10]), message, count=1)
 
 
-# Changes of requests. All leave a message that has its form; nothing but a password or a signature can show them.
+# Changes of requests. Each leaves a message of the right form, so only a password or a signature can reveal the change.
 PASSWORD = replaced(r"(<wsse:Password[^>]*>)p", r"\1q")
 LIFETIME = next_digit(r"(<soapenv:Body.*?<wst:Lifetime.*?<wsu:Expires>[-0-9T:]*\.\d\d)(\d)")
 TIMESTAMP = next_digit(r"(<wsu:Timestamp.*?<wsu:Created>[-0-9T:]*\.\d\d)(\d)")
@@ -35,12 +35,12 @@ END = next_digit(r"(<saml2:Conditions [^>]*NotOnOrAfter=\"[-0-9T:]*\.\d\d)(\d)")
 
 
 def certificate(text):
-    """A change of a request: another trusted certificate is put in the place of the one that signed."""
+    """A change of a request: another trusted certificate replaces that of the signature."""
     return replaced(r"(<wsse:BinarySecurityToken[^>]*>)[^<]*", r"\g<1>" + text)
 
 
 class Relay:
-    """Passes requests to a service. `change_request` and `change_answer` may be set; `is_changed` is whether they did."""
+    """Passes requests to a service, with the changes that are set. `is_changed` is whether one of them changed something."""
 
     def __init__(self, url, folder):
         self.change_request = self.change_answer = None
@@ -67,7 +67,7 @@ class Relay:
                 self.wfile.write(text)
 
             def log_message(self, format, *arguments):  # pylint: disable=redefined-builtin
-                """The relay says nothing; the tool reports what happens."""
+                """The relay prints nothing; the tool reports what happens."""
 
         self._server = http.server.HTTPServer(("127.0.0.1", 0), Handler)
         context = ssl.SSLContext(ssl.PROTOCOL_TLS_SERVER)

@@ -1,5 +1,5 @@
 # SPDX-License-Identifier: Apache-2.0
-"""One row of the table: an operation at an endpoint, what must come of it, and the changed copies that must be refused."""
+"""One row of the table: an operation at an endpoint, its expected result, and the changed copies that must be refused."""
 
 import dataclasses
 
@@ -13,7 +13,7 @@ STRICT_HINT = "--profile saml2"
 
 @dataclasses.dataclass
 class Outcome:
-    """What a row came to. A row that is as expected has no failures."""
+    """The result of a row. A row that is as expected has no failures."""
 
     row: "Row"
     failures: list
@@ -24,7 +24,7 @@ class Outcome:
 @dataclasses.dataclass
 class Row:
     """`request_changes` are the changes of the request that must be refused, by name, each with the expected exit code and
-    faults. `code` is the expected exit code, and `fault` the fault, of a row that is refused for a `reason`."""
+    faults. `code` is the expected exit code of the row. If the row is refused, `fault` is the fault, and `reason` the reason."""
 
     operation: str
     confirmation: str

@@ -1,5 +1,5 @@
 # SPDX-License-Identifier: Apache-2.0
-"""The rows of the table. A row may use a token that a row before it has written."""
+"""The rows of the table. A row may use a token that an earlier row has written."""
 
 import deployment
 import relay
@@ -42,7 +42,7 @@ ACTED_AS = attribute("ActAs", NAME_QUALIFIER, None, deployment.OTHER_USER)
 BEARER = {"confirmation": "bearer"}
 HOLDER_OF_KEY = {"confirmation": "holder-of-key"}
 
-# WSS4J's fault of every failed check. A policy reports a missing signature as a general fault.
+# WSS4J's fault for every failed check. A policy reports a missing signature as a general fault.
 SECURITY_ERROR = ["SecurityError"]
 POLICY_ERROR = ["SecurityError", "Server"]
 
@@ -72,7 +72,7 @@ def issue_rows(by_certificate):
             for endpoint in ("/plain/ut", "/ut", "/sts")]
     rows += [Row("issue by password, with an identity", "holder-of-key", endpoint, BY_PASSWORD + IDENTITY + ["--renewable"],
                  {**USER, **HOLDER_OF_KEY}, "key.xml", both) for endpoint in ("/plain/ut-x509", "/ut-x509")]
-    # This endpoint is content with the password: without a signature, the request is another one that it permits.
+    # The endpoint also permits a request with only the password. Without its signature, the request is such a request.
     with_password = {name: change for name, change in both.items() if name != "missing signature"}
     rows.append(Row("issue by password, with an identity", "holder-of-key", "/sts", BY_PASSWORD + IDENTITY + ["--renewable"],
                     {**USER, **HOLDER_OF_KEY}, "key.xml", with_password))
@@ -165,7 +165,7 @@ def validate_rows():
 
 
 def wrong_password_rows():
-    """A wrong password is recognised where the service reports it by a name that the dialect knows."""
+    """A wrong password is recognised if the service reports it with a fault that the dialect contains."""
     return [
         Row("issue by a wrong password", "bearer", "/ut", WRONG_PASSWORD, code=SERVICE_FAULT, fault="SecurityError",
             reason="the service reports a general security error"),

@@ -19,7 +19,7 @@ ENDPOINTS = {
 
 
 def written(outcomes):
-    """The table. A row that is refused has its reason."""
+    """Returns the table. A row that is refused shows the reason."""
     lines = ["| Operation | Confirmation | Endpoint | Result | Refused when changed |", "|---|---|---|---|---|"]
     for outcome in outcomes:
         row = outcome.row

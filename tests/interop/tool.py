@@ -31,18 +31,18 @@ class Tool:
         self.calls = 0
 
     def offline(self, *arguments):
-        """A command that calls no service."""
+        """Runs a command that calls no service."""
         self.calls += 1
         return Answer(subprocess.run([self._program, *arguments, "--trust", "sts.pem", "--format", "json", "-v"], cwd=self._folder,
                                      capture_output=True, text=True, check=False, timeout=120))
 
     def call(self, endpoint, arguments, profile="saml2", url=None):
-        """A command that calls the service at an endpoint."""
+        """Runs a command that calls the service at an endpoint."""
         return self.offline(*arguments, "--sts", (url or self._url) + endpoint, "--ca", "ca.pem", "--dialect", self._dialect,
                             "--profile", profile)
 
     def call_changed(self, endpoint, arguments, change_request=None, change_answer=None):
-        """The same through the relay. Returns None if the relay found nothing to change."""
+        """Runs such a command through the relay. Returns None if the relay found nothing to change."""
         self._relay.change_request, self._relay.change_answer = change_request, change_answer
         self._relay.is_changed = False
         answer = self.call(endpoint, arguments, url=self._relay.url)

@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// Requests in dialects other than the default, under the names of their golden files.
+/// Sample requests in dialects other than the default. Each has the name of its golden file.
 
 #pragma once
 
@@ -15,7 +15,7 @@ namespace Testing {
 /// The service's address in the samples.
 extern const char *const SAMPLE_SERVICE;
 
-/// Everything that a dialect can change, at once.
+/// A dialect in which each switch differs from the default.
 SsoClient::ServiceDialect FullDialect();
 
 /// At least one request for each switch.

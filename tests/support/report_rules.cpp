@@ -27,7 +27,7 @@ constexpr std::size_t MAX_REFERENCES = 10;
 constexpr std::size_t MAX_NAMED_CERTIFICATES = 16;
 constexpr const char *METHOD_BEARER = "urn:oasis:names:tc:SAML:2.0:cm:bearer";
 constexpr const char *METHOD_HOLDER_OF_KEY = "urn:oasis:names:tc:SAML:2.0:cm:holder-of-key";
-constexpr std::size_t LONGEST_TEXT = 1024 + 40; // with the note of how much was cut
+constexpr std::size_t LONGEST_TEXT = 1024 + 40; // the 40 are for the note that states how much was cut
 
 /// Collects what is wrong. Each rule is a function that is named after its promise.
 class Contradictions {
@@ -76,7 +76,7 @@ void ExpectFindingsOfFailedChecksOnly(const TokenReport &report, Contradictions 
                  name + (hasFindings ? " has findings" : " has no findings") + ", but " +
                      GetOutcomeName(result.outcome));
     listed += result.findings.size();
-    // Place for one finding is reserved for each later check.
+    // A report reserves one finding for each later check.
     wrong.Expect(result.unlistedFindings == 0 || listed + CHECKS >= TokenReport::MAX_FINDINGS,
                  name + " leaves out findings of a report with " + std::to_string(listed));
     for (const TokenReport::Finding &finding : result.findings) {
@@ -226,7 +226,7 @@ void ExpectConsistentKeys(const TokenReport &report, const JudgedVerifier &verif
   }
 }
 
-/// The claims that a token has, too, with the values that a token has for unknown ones.
+/// Describes the claims that a token has, too. A claim that is unknown gets the value that a token has in its place.
 std::string ClaimsLikeAToken(UnverifiedClaims claims) {
   claims.isAssertion = true;
   claims.issuer.reset();
@@ -287,13 +287,13 @@ void ExpectTheClaimsOfTheToken(const TokenReport &report, const Verification &ve
                "there are claims, but no assertion");
 }
 
-/// Whether one of several confirmations was chosen. The profile STRICT has only one, and uses it always.
+/// Whether a confirmation was chosen. In the profile STRICT, there is only one, and it is always used.
 bool HasUsedConfirmation(const UnverifiedClaims &claims, const VerifyOptions &options) {
   return options.profile == TokenProfile::STRICT ||
          (claims.details && claims.details->usedConfirmation < claims.details->confirmations.size());
 }
 
-/// The audiences of each restriction. The profile STRICT allows only one.
+/// The audiences of each restriction. The profile STRICT allows only one restriction.
 std::vector<std::set<std::string>> RestrictionsOf(const UnverifiedClaims &claims) {
   if (claims.details) {
     return claims.details->audienceRestrictions;

@@ -1,7 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
 /// The texts of a `TokenReport`, and a description of a report. Two reports with the same description have the same
-/// content.
+/// content, except that a public key is described only by its length.
 
 #pragma once
 

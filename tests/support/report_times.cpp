@@ -28,7 +28,7 @@ struct Misses {
   std::int64_t end = 0;
 };
 
-/// In the profile SAML2, dates of the conditions, of confirmations and of sessions count. Each message states its own.
+/// In the profile SAML2, the dates of conditions, confirmations and sessions are checked. Each message states its date.
 std::string JudgeSaml2Finding(const TokenReport::Finding &finding, std::int64_t now, std::int64_t tolerance) {
   for (const char *const beginning :
        {"Token start date is in the future: ", "The subject confirmation cannot be used before: ",

@@ -1,10 +1,10 @@
 #!/usr/bin/env python3
 # SPDX-License-Identifier: Apache-2.0
-"""Makes the hostile documents of this folder from the token fixtures in the folder tokens.
+"""Makes the hostile documents of this folder from the token fixtures in the folders tokens and saml2.
 
 Most are a genuine token that an attacker changed after the service had signed it; some are signed, with openssl and
-xmlsec1, by a key that is not trusted, or by the trusted key with an algorithm that must be refused. The expected outcome
-of each is in expected.tsv.
+xmlsec1, by a key that is not trusted, or by the trusted key with an algorithm or with content that an attacker chose. The
+expected outcome of each is in expected.tsv; expected-saml2.tsv has the outcomes that differ in the profile SAML2.
 
 usage: make.py [GROUP...]   GROUP is one of the functions listed at the end of this file; all of them by default. Some
 documents differ from run to run, because a key is made for them.
@@ -78,7 +78,7 @@ ID = re.search(r' ID="([^"]*)"', bearer).group(1)
 signature = SIGNATURE.search(bearer).group()
 unsigned = bearer.replace(signature, '').strip()
 bearer = bearer.strip()
-# The token that the attacker wants: with another subject, once with another ID and once with the genuine one.
+# The token that the attacker wants has another subject: once with the genuine ID, and once with another ID.
 forged = change(unsigned, 'alice@corp.example', 'admin@corp.example')
 forged_other_id = forged.replace(ID, '_forged')
 
@@ -214,7 +214,7 @@ def namespaces():
     write('namespace-xml-rebound', change(bearer, '<saml:Subject>', '<saml:Subject xmlns:xml="urn:x">'))
     write('namespace-xmlns-bound', change(bearer, '<saml:Subject>', '<saml:Subject xmlns:xmlns="urn:x">'))
     full = token('full')
-    # With exclusive canonicalisation, the binding of a prefix that only a type's name uses is not signed.
+    # With exclusive canonicalisation, the declaration of a prefix is not signed if only the value of xsi:type uses it.
     write('namespace-renew-type-rebound', change(
         full, 'xmlns:rsa="http://www.rsa.com/names/2009/12/std-ext/SAML2.0" xsi:type', 'xmlns:rsa="urn:evil" xsi:type'))
     write('namespace-delegation-type-rebound', change(
@@ -236,7 +236,7 @@ def algorithms():
             write(f'method-{name}', sign(hmac, '', '--hmackey', public_key.name))
     write('method-rsa-sha1', sign(change(template, rsa_sha256, DS + 'rsa-sha1')))
     write('method-rsa-sha224', sign(change(template, rsa_sha256, MORE + 'rsa-sha224')))
-    # Algorithms with which nothing is signed here; the name must be enough to refuse them.
+    # Nothing is signed here with these algorithms; their names must be enough to refuse them.
     for name, uri in (('rsa-md5', MORE + 'rsa-md5'), ('dsa-sha1', DS + 'dsa-sha1'), ('none', 'none'), ('empty', ''),
                       ('unknown', 'urn:unknown'), ('ecdsa-sha1', MORE + 'ecdsa-sha1'),
                       ('rsa-pss-parameters', 'http://www.w3.org/2007/05/xmldsig-more#rsa-pss'),
@@ -412,7 +412,7 @@ def unsigned_tokens():
 
 
 def saml2_content():
-    """Attacks on what the profile SAML2 ignores or reads in addition; expected-saml2.tsv is about these, too."""
+    """Attacks on what the profile SAML2 ignores or reads in addition."""
     def genuine(name):
         with open(os.path.join(HERE, '..', 'saml2', name + '.xml'), encoding='utf-8') as file:
             return file.read().strip()
@@ -452,14 +452,14 @@ def saml2_content():
             write(f'saml2-wrap-twice-signed-original-in-{container}-{name}',
                   inside(with_signature(evil, stock_signature), container, stock))
     for container in containers:
-        # The genuine token, whose signature is where the profile ignores what it does not know.
+        # The genuine token, with its signature at a place where the profile ignores unknown content.
         write(f'saml2-signature-in-{container}', inside(plain, container, stock_signature))
-        # Nobody signed the added content.
+        # The added content is not signed.
         write(f'saml2-added-{container}', inside(stock, container, '<x/>'))
-        # The service signed content of a caller, who chose the identifier of the assertion.
+        # The service signed content from a caller. An element of that content has the identifier of the assertion.
         template = blank(inside(stock, container, f'<x xmlns="urn:x" Id="{stock_id}"/>'))
         write(f'saml2-signed-duplicate-id-in-{container}', sign(template))
-        # The service signed content of a caller, who put an assertion there.
+        # The service signed content from a caller, and the content is another assertion.
         nested = change(plain, '>alice<', '>mallory<').replace(stock_id, '_nested')
         write(f'saml2-signed-assertion-in-{container}', sign(blank(inside(stock, container, nested))))
         nested_signed = with_signature(nested, stock_signature)
@@ -504,7 +504,7 @@ def saml2_content():
     write('saml2-one-time-use-removed', change(conditions, '<saml2:OneTimeUse/>', ''))
     session = genuine('authn-everything')
     write('saml2-session-extended', change(session, 'SessionNotOnOrAfter="2119', 'SessionNotOnOrAfter="2120'))
-    # With exclusive canonicalisation, the binding of a prefix that only a type's name uses is not signed.
+    # With exclusive canonicalisation, the declaration of a prefix is not signed if only the value of xsi:type uses it.
     delegated = genuine('delegation')
     prefix = re.search(r'xsi:type="([^":]*):DelegationRestrictionType"', delegated).group(1)
     write('saml2-delegation-type-rebound', change(

@@ -2,7 +2,7 @@
 # SPDX-License-Identifier: Apache-2.0
 """Makes the assertions of this folder that are not in details.txt: text changes to one assertion, signed with xmlsec1.
 
-The names of those that must be refused begin with "refused-", the others with "form-". expected.tsv says how each ends.
+The names of those that must be refused begin with "refused-", the others with "form-". The outcome of each is in expected.tsv.
 """
 import os
 import re
@@ -74,7 +74,7 @@ def data(attributes, content=''):
 
 
 def token(name, *changes):
-    """Writes NAME.xml: the assertion with each pair of `changes` replaced, then signed."""
+    """Writes NAME.xml: the assertion with `changes`, which are pairs of an old and a new text, and then signed."""
     text = BASE
     for old, new in changes:
         assert old in text, (name, old)
@@ -100,7 +100,7 @@ def attribute(text):
 
 
 def forms():
-    """Must be accepted."""
+    """Tokens that must be accepted."""
     token('form-no-attribute-statement', (ATTRIBUTES, ''))
     token('form-no-statement', (AUTHN + ATTRIBUTES, ''))
     token('form-many-statements', (AUTHN + ATTRIBUTES, ATTRIBUTES + AUTHN + ATTRIBUTES + AUTHN))
@@ -134,7 +134,7 @@ def forms():
 
 
 def refused():
-    """Must be refused by name."""
+    """Tokens that must be refused, each with a message that states the reason."""
     token('refused-encrypted-id', (NAME, f'<saml:EncryptedID>{ENCRYPTED}</saml:EncryptedID>'))
     token('refused-base-id', (NAME, f'<saml:BaseID {XSI} xmlns:x="urn:x" xsi:type="x:T"/>'))
     token('refused-encrypted-attribute', attribute(f'<saml:EncryptedAttribute>{ENCRYPTED}</saml:EncryptedAttribute>'))

@@ -1,5 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
-// Requests in dialects of services of other makers: what this service accepts of them, and what it refuses.
+// Requests in dialects that services of other makers need: what the development service accepts, and what it refuses.
 
 #include "messages.h"
 
@@ -23,7 +23,7 @@ using testing::Not;
 
 using Token = std::shared_ptr<const SamlToken>;
 
-/// Everything that a dialect can add to a request and a WS-Trust 1.3 service understands or ignores.
+/// Adds to a request everything that a dialect can add and a WS-Trust 1.3 service understands or ignores.
 ServiceDialect FullDialect() {
   ServiceDialect dialect;
   dialect.declaresCharset = true;
@@ -72,7 +72,7 @@ protected:
     return request.body;
   }
 
-  /// A request by alice's password that names `delegate` in the form of the dialect.
+  /// A request by alice's password, with `delegate` in the form of the dialect.
   static std::string PasswordBody(const ServiceDialect &dialect, const std::string &delegate) {
     TokenSpec spec = PlainSpec();
     spec.delegateTo = delegate;
@@ -171,7 +171,7 @@ TEST_F(Dialects, OnBehalfOfAnotherUserGetATokenAboutThatUser) {
   EXPECT_TRUE(byToken->GetDelegationChain().empty());
 }
 
-TEST_F(Dialects, OnBehalfOfAnybodyNeedCredentials) {
+TEST_F(Dialects, OnBehalfOfAnotherUserAreRefusedWithAWrongPassword) {
   EXPECT_TRUE(IsRefused(Post(Replaced(PasswordBody(OnBehalfOf(), "bob@corp.example"), "wonderland", "looking-glass")),
                         "wst:FailedAuthentication", "unknown user or wrong password"));
 }
@@ -183,7 +183,7 @@ TEST_F(Dialects, OnBehalfOfAnUnknownOrMalformedPartyAreRefused) {
                         "the party 'bob' is not of the form name@domain"));
 }
 
-TEST_F(Dialects, ThatDelegateInTwoWaysOrAsWsTrust14DoesAreRefused) {
+TEST_F(Dialects, ThatDelegateInTwoWaysOrByActAsAreRefused) {
   const std::string body = PasswordBody(ServiceDialect(), "bob@corp.example");
   const std::string delegate = "<wst:DelegateTo>" + Between(body, "<wst:DelegateTo>", "</wst:DelegateTo>");
   const std::string onBehalfOf =
@@ -202,7 +202,7 @@ TEST_F(Dialects, WithAnEmptyUseKeyAreRefused) {
                         "wst:InvalidRequest", "wst:UseKey refers to no signature and contains no ds:KeyInfo"));
 }
 
-TEST_F(Dialects, WithAddressingAreCoveredBySignaturesThatMayOmitTheHeaders) {
+TEST_F(Dialects, WithHeadersOfAddressingAreServedUnlessASignedHeaderIsChanged) {
   ServiceDialect dialect;
   dialect.addressing = true;
   const std::string body = CertificateBody(dialect);
@@ -210,7 +210,7 @@ TEST_F(Dialects, WithAddressingAreCoveredBySignaturesThatMayOmitTheHeaders) {
   const std::string action = Between(body, "<wsa:Action ", "</wsa:Action>");
   EXPECT_TRUE(
       IsRefused(Post(Replaced(body, action, action + "x")), "wsse:FailedCheck", "the message's signature is wrong"));
-  // Added headers are not signed, and not read.
+  // A header that is added after signing is not signed, and the service does not read it.
   const std::string plain = CertificateBody(ServiceDialect());
   EXPECT_TRUE(IsIssued(Post(Replaced(
       plain, "</soapenv:Header>", "<To xmlns=\"http://www.w3.org/2005/08/addressing\">urn:x</To></soapenv:Header>"))));

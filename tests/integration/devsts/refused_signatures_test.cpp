@@ -61,7 +61,8 @@ TEST_F(RefusedSignatures, MessageWithOneBitChangedIsRefusedOrGetsWhatWasSigned) 
     ASSERT_TRUE(IsIssued(answer)) << at;
     EXPECT_EQ(SaidIn(answer), signedSaying) << at;
   }
-  // The rest change text without meaning, such as the declaration of `wst` at the body, which its content repeats.
+  // The other changes are in text without meaning, such as the declaration of `wst` on the body, which the body's
+  // content repeats.
   EXPECT_GT(refusals, m_request.body.size() / STEP * 95 / 100);
 }
 

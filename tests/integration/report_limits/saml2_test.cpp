@@ -1,6 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
-// In the profile SAML2, verifying and explaining documents of the maximum length costs no more than in proportion to the
-// length. Each document is filled with pieces of one kind that only this profile reads, or reads in another way.
+// In the profile SAML2, the memory for verifying or explaining a document grows at most in proportion to its length, up
+// to the maximum length. Each document is filled with pieces of one kind that only this profile reads, or that it reads
+// in another way than the profile STRICT.
 
 #include "explained.h"
 
@@ -30,18 +31,18 @@ using Bench::Thin;
 
 constexpr std::size_t MIB = 1024u * 1024;
 constexpr std::size_t MAX_HEAP = 160 * MIB;           // of a verification, in addition to the text
-constexpr std::size_t MAX_HEAP_OF_REPORT = 240 * MIB; // the same of a report
-// In a principal, each octet of a qualifier can take three. A report has the principal and the qualifier.
+constexpr std::size_t MAX_HEAP_OF_REPORT = 240 * MIB; // of a report, in addition to the text
+// In a principal, an octet of a qualifier can become three octets. A report has the principal and the qualifier.
 constexpr std::size_t MAX_HEAP_OF_ENCODED = 320 * MIB;
 
-/// The token form-many-statements.xml, in which as many pieces as possible replace a text.
+/// The token form-many-statements.xml, with one text replaced by as many pieces as the length allows.
 struct Saml2Document {
   const char *name;
   std::string replaced;
   std::string begin;
   Piece piece;
   std::string end;
-  std::size_t pieces = 0; // at most; 0 for no limit
+  std::size_t pieces = 0; // the maximum number; 0 for no limit
   std::size_t maxHeapOfReport = MAX_HEAP_OF_REPORT;
 };
 
@@ -206,7 +207,7 @@ struct Cost {
 Cost Measure(const std::string &xml, bool isExplained) {
   static const SsoClient::TokenVerifier verifier = [] {
     SsoClient::TokenVerifier made = MakeVerifier();
-    made.Explain(Testing::ReadDataFile("saml2/holder-rsa-value.xml")); // what a process prepares only once
+    made.Explain(Testing::ReadDataFile("saml2/holder-rsa-value.xml")); // prepares what a process prepares only once
     return made;
   }();
   Cost cost;

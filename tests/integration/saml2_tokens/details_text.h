@@ -11,8 +11,8 @@
 
 namespace Testing {
 
-/// Each fact of `GetTokenDetails(token)`, one on each line.
-/// @throws std::logic_error if `GetNameId` or `GetAttributes` return anything else.
+/// The facts of `GetTokenDetails(token)`, one on each line.
+/// @throws std::logic_error if `GetNameId` or `GetAttributes` returns something else than `GetTokenDetails`.
 std::string DescribeDetails(const SsoClient::SamlToken &token);
 
 /// An identifier: " value {...} format {...}" and so on, and a line end.

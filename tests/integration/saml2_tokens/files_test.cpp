@@ -1,5 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
-// Tokens that OpenSAML, WSS4J and xmlsec1 made end as tests/data/saml2/expected.tsv says, and state what OpenSAML reads.
+// Tokens that OpenSAML, WSS4J and xmlsec1 made have the outcomes in tests/data/saml2/expected.tsv. In those of OpenSAML
+// and WSS4J, this library reads what OpenSAML reads.
 
 #include "details_text.h"
 #include "outcome_text.h"
@@ -56,7 +57,7 @@ private:
   const FixedEnvironment m_clock;
 };
 
-TEST_P(Saml2File, EndsAsTheTableSays) {
+TEST_P(Saml2File, HasTheOutcomeInTheTable) {
   EXPECT_EQ(GetParam().second, OutcomeOf(VerifierWith(Saml2Options()), m_xml));
 }
 
@@ -79,7 +80,7 @@ TEST_P(Saml2File, IsValidBySchemaIfItIsAccepted) {
   }
 }
 
-/// All of them have something that only the wider profile reads.
+/// Each file contains something that only the profile SAML2 reads.
 TEST_P(Saml2File, IsRefusedInTheStrictProfile) {
   EXPECT_ANY_THROW(VerifierWith(VerifyOptions()).Verify(m_xml));
 }
@@ -102,7 +103,7 @@ TEST(Saml2Files, AreAllInTheTable) {
   EXPECT_GT(inTable.size(), 110u);
 }
 
-/// What OpenSAML reads of each of its tokens.
+/// What OpenSAML reads in each token, by the name of the file.
 std::map<std::string, std::string> ReadDetails() {
   std::istringstream lines(ReadDataFile("saml2/details.txt"));
   std::map<std::string, std::string> details;

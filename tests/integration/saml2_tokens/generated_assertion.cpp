@@ -50,7 +50,7 @@ constexpr std::string_view TIMES[] = {
 constexpr std::size_t FIRST_FUTURE = 4;
 constexpr std::string_view BETWEEN[] = {"", "", "", " ", "\n  ", "<!-- c -->", "\t<!--ID='_g'-->\n"};
 
-/// Builds the assertion from its first to its last element. Each function adds one element.
+/// Builds the assertion from its first to its last element. Most functions are named after the element that they add.
 class Writer {
 public:
   explicit Writer(RandomSource &random) : m_random(random) {}
@@ -71,7 +71,7 @@ private:
   void Attribute(std::string_view name, std::string_view value) {
     m_xml.append(" ").append(name).append("=\"").append(value).append("\"");
   }
-  /// An attribute of the XML, and its fact in `description`.
+  /// Adds an attribute to the XML, and its fact to `description`.
   void Fact(std::string &description, std::string_view name, std::string_view label, std::string_view value) {
     Attribute(name, value);
     description.append(" ").append(label).append(" {").append(value).append("}");
@@ -80,7 +80,7 @@ private:
     Attribute(name, TIMES[index]);
     description.append(" ").append(label).append(" ").append(TIMES[index]);
   }
-  /// An element with a text, and its fact.
+  /// Adds an element with a text to the XML, and its fact to `description`.
   void Leaf(std::string &description, std::string_view name, std::string_view label, std::string_view text) {
     m_xml.append("<s:").append(name).append(">").append(text).append("</s:").append(name).append(">");
     description.append(" ").append(label).append(" {").append(text).append("}");
@@ -111,7 +111,7 @@ private:
   std::string m_attributes;
 };
 
-/// The element's description. A value is not escaped, so it contains no special character.
+/// Adds the element, and returns its description. The value is not escaped, so it must not contain a special character.
 std::string Writer::Name(std::string_view element, const std::string &value) {
   std::string format;
   std::string qualifiers;
@@ -151,7 +151,7 @@ void Writer::Subject() {
   m_xml += "</s:Subject>";
 }
 
-/// Whether the confirmation can be used.
+/// Adds a confirmation. Returns whether it can be used.
 bool Writer::Confirmation() {
   const bool isBearer = !Maybe(4);
   const std::string method = isBearer ? "urn:oasis:names:tc:SAML:2.0:cm:bearer" : "urn:x:method";

@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// `GeneratedAssertion`, a random assertion that the schema of SAML 2.0 allows, and what must be read of it.
+/// `GeneratedAssertion`, a random assertion that the schema of SAML 2.0 allows, and what must be read in it.
 
 #pragma once
 
@@ -16,7 +16,7 @@ struct GeneratedAssertion {
   std::string refusal; ///< why it must be refused; empty if it must be accepted
 };
 
-/// Its dates are around 2026-01-02T03:04:05Z, the time of `FixedEnvironment`.
+/// The dates in the assertion are before and after 2026-01-02T03:04:05Z, the time of `FixedEnvironment`.
 GeneratedAssertion GenerateAssertion(RandomSource &random);
 
 } // namespace Testing

@@ -47,7 +47,7 @@ std::vector<std::string> FilesIn(const std::string &folder) {
   return files;
 }
 
-/// The same choice in both profiles.
+/// A verifier of each profile, with the same other options.
 struct Verifiers {
   explicit Verifiers(const VerifyOptions &options) : strict(Trusted(), options), saml2(Trusted(), WithSaml2(options)) {}
 
@@ -75,7 +75,8 @@ std::vector<Verifiers> AllVerifiers() {
   return verifiers;
 }
 
-/// What is wrong with the outcomes for `xml`; empty if the profiles agree as they must.
+/// What is wrong with the outcomes for `xml`; empty if the profiles agree as they must. Sets `isAccepted` to whether
+/// STRICT accepts it.
 std::string FindContradictions(const Verifiers &verifiers, const std::string &xml, bool &isAccepted) {
   const Judgement strict = JudgeText(verifiers.strict, xml);
   const Judgement saml2 = JudgeText(verifiers.saml2, xml);
@@ -101,7 +102,7 @@ std::string FindContradictions(const Verifiers &verifiers, const std::string &xm
 
 class BothProfiles : public testing::Test {
 protected:
-  /// How many of the files STRICT accepts with one of the verifiers.
+  /// Tries each file with each of the verifiers. Returns how often STRICT accepted.
   int JudgeFiles(const std::string &folder) {
     int accepted = 0;
     for (const std::string &file : FilesIn(folder)) {
@@ -156,7 +157,7 @@ std::string SignedIfPossible(std::string xml) {
 TEST_F(BothProfiles, AgreeOnTokensThatAreSignedAfterAChange) {
   const std::size_t changes = IS_SANITIZED ? 20 : Repetitions<std::size_t>(5000, 150);
   RandomSource random(2026);
-  xmlSetGenericErrorFunc(nullptr, IgnoreError); // libxml2 reports what xmlsec1 cannot sign
+  xmlSetGenericErrorFunc(nullptr, IgnoreError); // otherwise libxml2 prints why xmlsec1 cannot sign a text
   std::size_t strictlyAccepted = 0;
   std::size_t tried = 0;
   std::vector<std::string> files;

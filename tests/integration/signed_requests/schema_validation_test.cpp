@@ -66,7 +66,7 @@ TEST_F(ValidRequest, MayContainEveryKindOfIssuedToken) {
   }
 }
 
-/// Shows that the schemas detect mistakes: each replacement in the request with the most elements must make it invalid.
+/// Shows that the schemas detect mistakes: each replacement makes the request with the most elements invalid.
 TEST_F(ValidRequest, IsInvalidAfterASmallMistake) {
   const std::pair<const char *, const char *> mistakes[] = {
       {"wsu:Created", "wsu:Make"},

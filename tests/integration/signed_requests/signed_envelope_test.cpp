@@ -42,8 +42,8 @@ protected:
     return Child(Find(document.Root(), "Security"), "Signature");
   }
 
-  /// The certificate to which the signature's key info refers: the one in the message, or the holder's for an
-  /// assertion.
+  /// The certificate to which the signature's key info refers: the certificate in the message, or that of the holder if
+  /// the key info refers to an assertion.
   static std::string NamedCertificate(const ForeignDocument &document) {
     const xmlNodePtr keyInfo = Child(MessageSignature(document), "KeyInfo");
     const auto references = FindAll(keyInfo, "Reference");

@@ -25,10 +25,10 @@ struct Outcome {
 
 std::ostream &operator<<(std::ostream &out, const Outcome &outcome);
 
-/// The service's certificates, one for each kind and size of key that signs the fixtures; not "other".
+/// The service's certificates: one for each kind and size of key that signs the fixtures. "other" is not among them.
 const Tarvel::Crypto::CertificateList &Trusted();
 
-/// The outcome for `xml` with those certificates and the default options.
+/// The outcome for `xml` with the certificates of `Trusted` and, except for the profile, the default options.
 Outcome TryToken(const std::string &xml, SsoClient::TokenProfile profile = SsoClient::TokenProfile::STRICT);
 
 /// The outcome for the assertion number `index` (from 0, in document order) of the document `xml`.

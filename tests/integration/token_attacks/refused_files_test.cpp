@@ -1,7 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
-// Every hostile document under tests/data/attacks ends as tests/data/attacks/expected.tsv says: in the documented
-// exception with exactly that message, or, where the change is harmless, accepted with the facts that were signed. The
-// same is true in the profile SAML2, except where expected-saml2.tsv says how the document ends there.
+// Every hostile document under tests/data/attacks has the outcome in tests/data/attacks/expected.tsv: it is refused
+// with exactly that exception and message, or, if the change is harmless, accepted with the subject that was signed.
+// The outcome in the profile SAML2 is the same, except if expected-saml2.tsv has another one.
 
 #include "outcome.h"
 
@@ -51,7 +51,7 @@ std::vector<Row> StrictTable() {
   return ReadTable("attacks/expected.tsv");
 }
 
-/// The table of the profile STRICT, with the rows that differ.
+/// The table of the profile STRICT, in which the rows of expected-saml2.tsv replace those of the same files.
 std::vector<Row> Saml2Table() {
   std::map<std::string, Row> differing;
   for (const Row &row : ReadTable("attacks/expected-saml2.tsv")) {

@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
-// Every prefix of genuine tokens, and thousands of small changes to them: never an undocumented exception, and never a
-// token with facts other than those that were signed.
+// No prefix of a genuine token, and none of thousands of small changes to it, causes an undocumented exception, or is
+// accepted with facts other than those that were signed.
 
 #include "outcome.h"
 #include "support/data_file.h"
@@ -40,7 +40,8 @@ class Truncation : public testing::TestWithParam<std::string> {};
 TEST_P(Truncation, EveryPrefixIsRefusedByTheParser) {
   const std::string xml = ReadToken(GetParam());
   const Outcome whole = TryToken(xml);
-  // Only comments and white space follow the end tag; cutting them changes nothing.
+  // Only comments and white space follow the end tag. A prefix that ends there is the same token, or not well-formed if
+  // it ends in a comment.
   const std::size_t rootEnd = xml.rfind("Assertion>") + std::string("Assertion>").size();
   // The large token repeats one line; steps of a prime length reach each place of that line.
   const std::size_t step = xml.size() > 20000 ? Testing::Repetitions<std::size_t>(1, 61) : 1;
@@ -86,7 +87,7 @@ protected:
   const Outcome m_genuine = TryToken(m_xml, GetParam().profile);
 };
 
-TEST_P(Mutation, EachBitFlippedNeverYieldsOtherFacts) {
+TEST_P(Mutation, EachFlippedBitNeverLeadsToOtherFacts) {
   for (std::size_t place = 0; place < m_xml.size(); ++place) {
     for (unsigned bit = 0; bit < 8; ++bit) {
       if (!IsTurn(bit, 8, place)) {
@@ -100,7 +101,7 @@ TEST_P(Mutation, EachBitFlippedNeverYieldsOtherFacts) {
   }
 }
 
-TEST_P(Mutation, EachOctetReplacedByAMarkupCharacterNeverYieldsOtherFacts) {
+TEST_P(Mutation, EachOctetReplacedByAMarkupCharacterNeverLeadsToOtherFacts) {
   const std::string characters("<>&\"'=:/ \n\0", 11);
   for (std::size_t place = 0; place < m_xml.size(); ++place) {
     for (std::size_t i = 0; i < characters.size(); ++i) {
@@ -115,7 +116,7 @@ TEST_P(Mutation, EachOctetReplacedByAMarkupCharacterNeverYieldsOtherFacts) {
   }
 }
 
-TEST_P(Mutation, EachChunkDeletedOrDoubledNeverYieldsOtherFacts) {
+TEST_P(Mutation, EachChunkDeletedOrDoubledNeverLeadsToOtherFacts) {
   for (const std::size_t length : {1u, 7u, 32u, 129u, 1000u}) {
     for (std::size_t place = 0; place + length <= m_xml.size(); place += std::max<std::size_t>(5, length / 3)) {
       const std::string what = std::to_string(length) + " octets at " + std::to_string(place);
@@ -152,7 +153,7 @@ std::vector<std::pair<std::size_t, std::size_t>> ElementRanges(const std::string
   return ranges;
 }
 
-TEST_P(Mutation, EachElementDeletedDoubledOrCopiedElsewhereNeverYieldsOtherFacts) {
+TEST_P(Mutation, EachElementDeletedDoubledOrCopiedElsewhereNeverLeadsToOtherFacts) {
   const auto ranges = ElementRanges(m_xml);
   ASSERT_GT(ranges.size(), 10u);
   for (const auto &[begin, end] : ranges) {

@@ -60,7 +60,7 @@ std::vector<VerifyOptions> Choices() {
           WithConfirmation(SamlToken::HOLDER_OF_KEY)};
 }
 
-/// Those of the profile STRICT, and what only the profile SAML2 checks.
+/// The choices for the profile STRICT, and some with options that only the profile SAML2 checks.
 std::vector<VerifyOptions> Saml2Choices() {
   std::vector<VerifyOptions> choices = Choices();
   VerifyOptions options;

@@ -109,7 +109,7 @@ TEST_F(Acquire, ReadsAnIdentityFromAKeyStoreAndAnEncryptedKey) {
   }
 }
 
-TEST_F(Acquire, ReadsPasswordAndPassphraseFromOneScript) {
+TEST_F(Acquire, ReadsPasswordAndPassphraseFromFileDescriptors) {
   Run("openssl pkcs8 -topk8 -in client.key -passout pass:'open sesame' -out encrypted.key");
   m_folder.Write("passphrase.txt", "open sesame\n");
   const Result result = Run("ssoclient acquire " + Service() +
@@ -212,7 +212,7 @@ struct Answer {
   int exitCode;
   const char *exceptionClass;
   const char *label;
-  const char *message; ///< contains nothing that JSON escapes
+  const char *message; ///< contains no character that JSON escapes
 };
 
 const Answer ANSWERS[] = {

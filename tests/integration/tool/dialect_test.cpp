@@ -73,7 +73,7 @@ const Mistake MISTAKES[] = {
 
 class WrongDialect : public testing::TestWithParam<Mistake> {};
 
-// There is no password, no identity file and no token: what the dialect lacks is found before any of them is read.
+// There is no password, no identity file and no token: the wrong dialect is refused before any of them is read.
 TEST_P(WrongDialect, IsRefusedByEachCommandBeforeAnythingElseIsReadOrSent) {
   const std::string service = " --sts https://127.0.0.1:9/sts --trust missing.crt ";
   for (const std::string &command :
@@ -87,7 +87,7 @@ TEST_P(WrongDialect, IsRefusedByEachCommandBeforeAnythingElseIsReadOrSent) {
 INSTANTIATE_TEST_SUITE_P(Of, WrongDialect, testing::ValuesIn(MISTAKES),
                          [](const auto &mistake) { return std::string(mistake.param.name); });
 
-TEST(DialectOptions, MaySayTheSameTwice) {
+TEST(DialectOptions, MayRepeatTheSameValue) {
   const ClosedPort port;
   ExpectResult(RunShell("ssoclient validate --trust sts-rsa.crt --sts https://" + port.HostAndPort() +
                         " --addressing --dialect-switch addressing=true --applies-to urn:a --dialect-switch "
@@ -96,7 +96,7 @@ TEST(DialectOptions, MaySayTheSameTwice) {
                "ssoclient: communication failed: Cannot connect to " + port.HostAndPort() + ": Connection refused\n");
 }
 
-TEST(DialectOptions, DoNotAskForWhatTheDialectNeverWrites) {
+TEST(DialectOptions, CannotAskForWhatTheDialectNeverWrites) {
   const std::string acquire = "setsid -w ssoclient acquire --sts https://127.0.0.1:9/sts --trust missing.crt --user x ";
   ExpectResult(RunShell(acquire + "--renewable --dialect-switch renewing=never"), 2, "",
                "ssoclient: usage: --renewable cannot be asked for, because the dialect's switch renewing is never\n");
@@ -141,7 +141,7 @@ TEST(DialectCommand, ReadsTheFileInTheManual) {
   EXPECT_THAT(example.out, HasSubstr("\n  \"charset\": \"utf-8\",\n"));
 }
 
-TEST(DialectCommand, RefusesWhatIsNoDialect) {
+TEST(DialectCommand, RefusesWhatIsNotADialect) {
   ExpectResult(RunShell("ssoclient dialect cfx"), 2, "",
                "ssoclient: usage: 'cfx' is neither a dialect nor a file; the dialects are default, cxf\n");
   ExpectResult(RunShell("ssoclient dialect cxf --format xml"), 2, "",
@@ -156,7 +156,7 @@ class DialectService : public ServiceTest {};
 
 constexpr const char *ON_BEHALF_OF = "--dialect-switch delegation=on-behalf-of --delegate-to ";
 
-TEST_F(DialectService, IsAskedByEachCommand) {
+TEST_F(DialectService, ServesEachCommandInItsDialect) {
   m_folder.Write("full.json", R"({"charset": "utf-8", "delegatable": "when-true", "renewing": "when-true",
     "use-key": "certificate", "token-type-reference": "standard"})");
   const std::string dialect = "--dialect full.json --addressing --applies-to https://files.example/ ";
@@ -184,8 +184,9 @@ TEST_F(DialectService, IsAskedInItsDialectToRenewAndToValidate) {
   EXPECT_THAT(server.GetRequests()[1], HasSubstr("/RST/Validate</wsa:Action>"));
 }
 
-// The service answers in the type that was asked for, and the library accepts no other: so the switch reached both.
-TEST_F(DialectService, GetsEachSwitchOfTheCommandLine) {
+// The service answers with the token type that was asked for, and the library accepts no other type. If only one of
+// them received the switch, the command would fail.
+TEST_F(DialectService, GetsASwitchOfTheCommandLine) {
   const std::string type = "--dialect-switch "
                            "token-type=http://docs.oasis-open.org/wss/oasis-wss-saml-token-profile-1.1#SAMLV2.0 ";
   Acquire("token.xml", std::string(PASSWORD) + type);
@@ -194,7 +195,7 @@ TEST_F(DialectService, GetsEachSwitchOfTheCommandLine) {
   EXPECT_THAT(m_service.GetLog(), HasSubstr("unsupported token type 'urn:other'"));
 }
 
-TEST_F(DialectService, HasTheSwitchesOfTheCommandLineAfterThoseOfThePreset) {
+TEST_F(DialectService, GetsTheSwitchesOfTheCommandLineInsteadOfThoseOfThePreset) {
   // The preset writes wst:OnBehalfOf; the switch makes it wst:DelegateTo again.
   const Result result = Run("ssoclient acquire " + Service() + PASSWORD +
                             "--dialect cxf --dialect-switch delegation=delegate-to --delegate-to bob@corp.example");
@@ -203,7 +204,7 @@ TEST_F(DialectService, HasTheSwitchesOfTheCommandLineAfterThoseOfThePreset) {
   EXPECT_THAT(result.out, HasSubstr("\nDelegate:        bob@corp.example at "));
 }
 
-TEST_F(DialectService, GivesATokenAboutTheOtherPartyWithoutAWarning) {
+TEST_F(DialectService, IssuesATokenAboutTheOtherPartyWithoutAWarning) {
   const Result result = Run("ssoclient acquire " + Service() + PASSWORD + ON_BEHALF_OF + "bob@corp.example");
   EXPECT_EQ(0, result.exitCode);
   EXPECT_EQ("", result.err);

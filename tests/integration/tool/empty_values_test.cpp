@@ -38,7 +38,7 @@ TEST_P(EmptyValue, OfEachOptionIsAWrongCommandLine) {
 INSTANTIATE_TEST_SUITE_P(Of, EmptyValue, testing::ValuesIn(COMMANDS),
                          [](const auto &command) { return std::string(command.param); });
 
-TEST(EmptyValue, IsTestedForTheOptionsThatTakeAnArgument) {
+TEST(EmptyValue, IsTestedForTheOptionsWithAnArgument) {
   const std::set<std::string> options = OptionsWithArgument("acquire");
   EXPECT_THAT(options, IsSupersetOf({"--sts",           "--ca",
                                      "--thumbprint",    "--trust",

@@ -43,7 +43,7 @@ inline std::string ExpectedJson(const std::string &file, bool verified) {
   return Fill(Expected(file), "@VERIFIED@", verified ? "true" : "false");
 }
 
-/// The JSON `text` without its last key, the report. @throws what nlohmann_json throws when it has none.
+/// The JSON `text` without its key "report". @throws what nlohmann_json throws if `text` does not have that key.
 inline std::string WithoutReport(const std::string &text) {
   auto json = nlohmann::ordered_json::parse(text);
   json.at("report");
@@ -51,7 +51,7 @@ inline std::string WithoutReport(const std::string &text) {
   return json.dump(2, ' ', true) + "\n";
 }
 
-/// The JSON `text` without the keys of a token's details. @throws what nlohmann_json throws when it does not have all.
+/// The JSON `text` without the keys of a token's details. @throws what nlohmann_json throws if one of them is missing.
 inline std::string WithoutDetails(const std::string &text) {
   auto json = nlohmann::ordered_json::parse(text);
   for (const char *const key : {"nameId", "issuer", "issueInstant", "confirmations", "audienceRestrictions",

@@ -1,5 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
-// `verify --explain` shows each check of a token, and ends like `verify`.
+// `verify --explain` shows each check of a token, and ends with the same exit code and refusal as `verify`.
 
 #include "expect_result.h"
 #include "expected_output.h"
@@ -46,7 +46,7 @@ TEST(VerifyExplain, ShowsAnAcceptedTokenAndThatEachCheckHasPassed) {
   EXPECT_THAT(result.out, HasSubstr("made the signature"));
 }
 
-TEST(VerifyExplain, ShowsWhyATokenIsRefusedAndNothingThatItSays) {
+TEST(VerifyExplain, ShowsWhyATokenIsRefusedAndNothingThatItStates) {
   const Result result = RunTool(Explain("expired.xml"));
   EXPECT_EQ(5, result.exitCode);
   EXPECT_EQ("ssoclient: token invalid: The token has expired at: 2021-01-01T00:00:00.000Z\n", result.err);

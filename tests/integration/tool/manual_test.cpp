@@ -51,7 +51,7 @@ std::string WithOneBlank(const std::string &line) {
   return line.substr(number, blanks - number) + " " + line.substr(text);
 }
 
-/// The lines from `begin` to `end`, each with one blank between its number and the text after it.
+/// The lines between `begin` and `end`, each with one blank between its number and the text after it.
 std::string TableIn(const std::string &text, const std::string &begin, const std::string &end) {
   const std::size_t first = text.find(begin) + begin.size();
   std::istringstream lines(text.substr(first, text.find(end, first) - first));

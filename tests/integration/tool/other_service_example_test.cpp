@@ -29,7 +29,7 @@ TEST_F(OtherServiceExample, AcquiresRenewsValidatesAndExchangesAToken) {
               testing::MatchesRegex("acquired" + facts + "renewed" + facts + "valid\n" + "exchanged" + facts));
 }
 
-TEST_F(OtherServiceExample, SaysWhyItFails) {
+TEST_F(OtherServiceExample, ReportsWhyItFails) {
   ExpectResult(RunExample("STS_PASSWORD=looking-glass"), 1, "",
                "failed: Authentication failed: unknown user or wrong password\n");
   ExpectResult(RunExample(""), 1, "", "failed: the variable STS_PASSWORD is not set\n");

@@ -1,5 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
-// `--profile` chooses the form of token that is accepted, and hints say whether the other profile accepts a token.
+// `--profile` chooses which form of token is accepted, and hints state whether the other profile accepts a token.
 
 #include "expect_result.h"
 #include "process.h"
@@ -31,7 +31,7 @@ constexpr const char *STRICT_REFUSAL =
 
 constexpr const char *VOUCHED = "urn:oasis:names:tc:SAML:2.0:cm:sender-vouches";
 
-/// The token of another maker's service, with a bearer confirmation that states all that it can.
+/// The token of another maker's service, with a bearer confirmation that states a recipient, a request and an address.
 std::string ForeignToken() {
   std::string token = ReplaceOnce(ReadDataFile("foreign/saml2.xml"), VOUCHED, "urn:oasis:names:tc:SAML:2.0:cm:bearer");
   token = ReplaceOnce(token, " Recipient=\"https://files.corp.example/\"",
@@ -63,12 +63,12 @@ TEST(Profile, StrictIsTheDefault) {
   EXPECT_EQ(Verify({}).err, Verify({"--profile", "strict"}).err);
 }
 
-TEST(Profile, OtherThanTheTwoIsRefused) {
+TEST(Profile, IsRefusedIfItIsUnknown) {
   ExpectResult(Verify({"--profile", "lax"}), 2, "",
                "ssoclient: usage: --profile: lax not in {strict,saml2}; see ssoclient --help\n");
 }
 
-TEST(Profile, HintSaysWhySaml2RefusesTheTokenToo) {
+TEST(Profile, HintStatesWhySaml2AlsoRefusesTheToken) {
   const std::string refusal = std::string("Unknown subject confirmation method: '") + VOUCHED + "'";
   ExpectResult(Verify({}, ReadDataFile("foreign/saml2.xml")), 5, "",
                std::string(STRICT_REFUSAL) + "--profile saml2 does not accept this token either: " + refusal + "; " +
@@ -91,7 +91,7 @@ TEST(Profile, HintIsPrintable) {
   EXPECT_THAT(Verify({}, token).err, Not(HasSubstr("\xC2\x9B")));
 }
 
-TEST(Profile, Saml2ChecksWhatTheOptionsOfTheConfirmationSay) {
+TEST(Profile, Saml2ChecksTheConfirmationAgainstTheOptions) {
   const std::vector<std::string> fitting = {
       "--profile",        "saml2", "--recipient",      "urn:other", "--recipient", "https://files.corp.example/",
       "--in-response-to", "_7",    "--sender-address", "192.0.2.7"};
@@ -117,7 +117,7 @@ TEST(Profile, StrictRefusesOptionsThatItCannotCheck) {
   }
 }
 
-TEST(Profile, OfAReportIsThatOfTheOption) {
+TEST(Profile, OfTheOptionIsUsedForReports) {
   const std::string token = ForeignToken();
   const ordered_json strict = ordered_json::parse(RunTool({"inspect", "--format", "json", "-"}, token).out);
   const ordered_json saml2 =
@@ -148,11 +148,11 @@ TEST_F(ProfileOfService, IsUsedForGivenAndIssuedTokens) {
     EXPECT_EQ(5, strict.exitCode) << command;
     EXPECT_THAT(strict.err, HasSubstr("hint: --profile saml2 accepts this token; ")) << command;
     const Result accepted = Run("ssoclient " + command + Service() + both + saml2 + "foreign.xml");
-    EXPECT_THAT(accepted.err, Not(HasSubstr("token invalid"))) << command; // the service does not know its signer
+    EXPECT_THAT(accepted.err, Not(HasSubstr("token invalid"))) << command; // the service does not trust the signer
   }
 }
 
-TEST_F(ProfileOfService, OfAnIssuedTokenThatIsRefusedIsInTheHint) {
+TEST_F(ProfileOfService, IsInTheHintAboutAnIssuedTokenThatIsRefused) {
   const std::string line = "ssoclient acquire " + Service("unknown-element") + PASSWORD;
   EXPECT_THAT(Run(line).err, HasSubstr("hint: --profile saml2 does not accept this token either: Unexpected content of "
                                        "element 'saml:Assertion': element saml:Surprise; --save-refused FILE keeps "));

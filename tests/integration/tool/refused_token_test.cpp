@@ -119,7 +119,7 @@ TEST_F(SaveRefused, WritesNoFileWhenNoTokenIsRefused) {
 }
 
 TEST_F(SaveRefused, WarnsWhenTheFileCannotBeWritten) {
-  // A limit of file sizes has the same effect as a full disk. Its signal is ignored.
+  // A limit on file sizes has the same effect as a full disk. The signal that reports the limit is ignored.
   const std::string limited = "trap '' XFSZ; ulimit -f 0; " + Line();
   const std::string problem = "the refused token could not be saved: refused.xml: File too large";
   ExpectResult(Run(limited), 6, "",

@@ -85,7 +85,7 @@ struct Refusal {
   int exitCode;
   const char *exceptionClass;
   const char *label;
-  const char *message; ///< in text; contains nothing that JSON escapes
+  const char *message; ///< contains no character that JSON escapes
 };
 
 const Refusal REFUSALS[] = {

@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
-// What the tool reports when the issued token is not what was asked for, and about requests that services are known to
-// refuse.
+// What the tool reports if the issued token lacks something that was asked for, and for requests that services are
+// known to refuse.
 
 #include "expect_result.h"
 #include "service_test.h"
@@ -149,14 +149,14 @@ TEST_F(DoubtfulRequest, ForADelegatedTokenWithAnIdentityIsSentWithAWarningAndRef
   EXPECT_THAT(bearer.out, HasSubstr("\nDelegate:        bob@corp.example at "));
 }
 
-TEST_F(DoubtfulRequest, IsNotOneThatContainsTheCertificateSinceSomeServicesGrantIt) {
+TEST_F(DoubtfulRequest, IsNotOneThatContainsTheCertificateBecauseSomeServicesGrantIt) {
   ExpectResult(Run("ssoclient acquire " + Service() + PASSWORD + IDENTITY +
                    "--delegate-to bob@corp.example --dialect-switch use-key=certificate"),
                8, "", "ssoclient: service fault: Unexpected SOAP fault: wst:InvalidRequest; request failed.\n");
   EXPECT_THAT(m_service.GetLog(), HasSubstr("the request asks for a holder-of-key token without proof of a key"));
 }
 
-TEST_F(DoubtfulRequest, OfABearerTokensExchangeIsSentWithAWarningAndRefusedWithAHint) {
+TEST_F(DoubtfulRequest, ToExchangeABearerTokenIsSentWithAWarningAndRefusedWithAHint) {
   Acquire("bearer.xml", std::string(PASSWORD) + "--delegable");
   const std::string line = "ssoclient acquire " + Service() + IDENTITY + "--token bearer.xml ";
   ExpectResult(Run(line), 8, "",

@@ -118,7 +118,7 @@ bool IsWritten(Statement statement, bool value) {
   return statement == Statement::ALWAYS || (statement == Statement::WHEN_TRUE && value);
 }
 
-/// What the switches cannot change.
+/// The parts of `request` that the switches cannot change.
 std::string Common(std::string request) {
   for (const char *const name : {"wst:TokenType", "wsp:AppliesTo", "wst:Renewing", "wst:Delegatable", "wst:DelegateTo",
                                  "wst:OnBehalfOf", "wst14:ActAs", "wst:UseKey"}) {
@@ -217,7 +217,7 @@ std::string TextIn(const std::string &message, const std::string &name) {
   return message.substr(start, message.find('<', start) - start);
 }
 
-TEST(Addressing, NamesTheServiceAndTheActionOfEachRequest) {
+TEST(Addressing, StatesTheServiceAndTheActionOfEachRequest) {
   ServiceDialect dialect;
   dialect.addressing = true;
   const RequestBuilderImpl builder(HolderIdentity(), dialect, "https://sts.example/STS");
@@ -236,7 +236,7 @@ TEST(Addressing, NamesTheServiceAndTheActionOfEachRequest) {
   }
 }
 
-TEST(Addressing, GivesEveryRequestANewMessageId) {
+TEST(Addressing, WritesANewMessageIdInEveryRequest) {
   ServiceDialect dialect;
   dialect.addressing = true;
   const RequestBuilderImpl builder(boost::none, dialect, SAMPLE_SERVICE);

@@ -93,14 +93,14 @@ TEST(AnyResponse, IsFoundOnlyInItsPlaceWithoutTheSwitch) {
                         UNEXPECTED);
 }
 
-TEST(AnyResponse, IsFirstSearchedWhereTheOperationUsuallyHasIt) {
+TEST(AnyResponse, IsSearchedFirstInTheUsualPlaceOfTheOperation) {
   const std::string both =
       Envelope(ResponseElement(Token("_body")) + Collection(ResponseElement(Token("_collection"))));
   EXPECT_EQ(Acquired(AnyResponse(), both), "_collection");
   EXPECT_EQ(Renewed(AnyResponse(), both), "_body");
 }
 
-TEST(AnyResponse, MustStillBeThere) {
+TEST(AnyResponse, IsRefusedWithoutAResponseElement) {
   for (const std::string &response : {Envelope(""), Envelope(Token("_1")), Envelope(Collection(Token("_1")))}) {
     EXPECT_THROWS_MESSAGE(Acquired(AnyResponse(), response), SsoException, UNEXPECTED);
     EXPECT_THROWS_MESSAGE(Renewed(AnyResponse(), response), SsoException, UNEXPECTED);
@@ -131,7 +131,7 @@ TEST(AnyResponse, ContinuesANegotiationWithALegWhereverItIs) {
                         UNEXPECTED);
 }
 
-TEST(RequestedTokenType, IsTheOneThatTheEndOfANegotiationMustHave) {
+TEST(RequestedTokenType, IsRequiredAtTheEndOfANegotiation) {
   const auto end = [](const std::string &type) {
     return Envelope(
         Collection(ResponseElement("<wst:TokenType>" + type + "</wst:TokenType>" + Token("_1"), " Context='c'")));
@@ -171,7 +171,7 @@ TEST(CredentialFault, IsAddedToThoseThatAlwaysMeanRefusedCredentials) {
   }
 }
 
-TEST(CredentialFault, OfCxfIsItsFailedAuthenticationAndNotItsGeneralSecurityError) {
+TEST(CredentialFault, OfCxfIsFailedAuthenticationAndNotTheGeneralSecurityError) {
   const ServiceDialect dialect = GetServiceDialect("cxf");
   EXPECT_THROWS_MESSAGE(Acquired(dialect, FaultResponse("wsse:FailedAuthentication", "no")),
                         InvalidCredentialsException, "Authentication failed: no");
@@ -198,7 +198,7 @@ TEST(DialectOfAHandler, IsKeptByItsCopyWithAListener) {
   EXPECT_EQ(listener.count, 1);
 }
 
-TEST(ResponseWithAddressing, IsReadAsWithout) {
+TEST(ResponseWithAddressing, IsReadLikeOneWithoutAddressing) {
   std::string response = Envelope(Collection(ResponseElement(Token("_1"))));
   const std::string header = "<soapenv:Header/>";
   response.replace(response.find(header), header.size(),

@@ -1,6 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
-// Compares every request byte for byte with its file in tests/data/requests. A change of the wire format is a difference in
-// these files. With SSOCLIENT_UPDATE_GOLDEN=1 the test writes them again and then fails, so that every change is noticed.
+// Compares every request byte for byte with its file in tests/data/requests. A change of the wire format appears as a
+// difference in these files. With SSOCLIENT_UPDATE_GOLDEN=1 the test writes the files again, and then fails, so every
+// change is noticed.
 #include "support/data_file.h"
 #include "support/dialect_requests.h"
 #include "support/fixed_environment.h"

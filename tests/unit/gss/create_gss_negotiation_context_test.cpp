@@ -84,7 +84,7 @@ TEST(CreateGssNegotiationContext, SignsRequestsWithTheHolderOfKeyIdentity) {
   EXPECT_NE(server.GetRequests().at(1).find("ds:SignatureValue"), std::string::npos);
 }
 
-TEST(CreateGssNegotiationContext, SpeaksTheDialectInEveryLeg) {
+TEST(CreateGssNegotiationContext, UsesTheDialectInEveryLeg) {
   const std::string last = Testing::ResponseElement("<wst:TokenType>urn:type</wst:TokenType>" +
                                                         Testing::Requested(Testing::ReadDataFile("tokens/bearer.xml")),
                                                     " Context='ctx'");
@@ -108,7 +108,7 @@ TEST(CreateGssNegotiationContext, SpeaksTheDialectInEveryLeg) {
   EXPECT_NE(requests[1].find("/RSTR/Issue</wsa:Action>"), std::string::npos);
 }
 
-TEST(CreateGssNegotiationContext, RefusesADialectThatContradictsItself) {
+TEST(CreateGssNegotiationContext, RefusesADialectThatIsNotValid) {
   ServiceOptions options;
   options.dialect.appliesTo = std::string("service");
   EXPECT_THROWS_MESSAGE(CreateGssNegotiationContext(ConfigFor("http://localhost/"), Spec(), options),

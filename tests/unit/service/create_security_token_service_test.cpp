@@ -87,7 +87,7 @@ TEST(CreateSecurityTokenService, PassesTheSslParameterToTheHandshake) {
           shown->GetSha256Thumbprint() + " instead of " + config.sslParameter);
 }
 
-TEST(CreateSecurityTokenService, SpeaksTheDialectInRequestsAndResponses) {
+TEST(CreateSecurityTokenService, UsesTheDialectInRequestsAndResponses) {
   const std::string fault = "<soapenv:Fault xmlns:x='urn:faults'><faultcode>x:Denied</faultcode></soapenv:Fault>";
   const std::string outside = Testing::RenewResponse(Testing::ReadDataFile("tokens/bearer.xml"));
   const PostingServer server({outside, Testing::Envelope(fault)});
@@ -114,7 +114,7 @@ TEST(CreateSecurityTokenService, DeclaresNoCharsetByDefault) {
   EXPECT_NE(request.find("\r\nContent-Type: text/xml\r\n"), std::string::npos) << request;
 }
 
-TEST(CreateSecurityTokenService, RefusesADialectThatContradictsItself) {
+TEST(CreateSecurityTokenService, RefusesADialectThatIsNotValid) {
   ServiceOptions options;
   options.dialect.tokenType = "urn:oasis:names:tc:SAML:1.1:assertion";
   EXPECT_THROWS_MESSAGE(CreateSecurityTokenService(ConfigFor("http://localhost/"), options),

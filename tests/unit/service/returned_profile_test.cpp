@@ -1,5 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
-// A service whose tokens are verified in the profile SAML2. Only the network is replaced.
+// A service that verifies tokens in the profile SAML2, with a stand-in for the network.
 #include "exchange/request_builder_impl.h"
 #include "exchange/response_handler_impl.h"
 #include "support/identity.h"

@@ -41,7 +41,7 @@ TEST(GetSubjectPublicKey, IsTheKeyThatOpenSslWritesForTheCertificate) {
             StringUtil::Base64Encode(GetSubjectPublicKey(*FixtureCertificate("p256"))));
 }
 
-TEST(GetSubjectPublicKey, IsThatOfACertificateWithAKeyOfAnyKind) {
+TEST(GetSubjectPublicKey, ReturnsAKeyThatIsNeitherRsaNorEc) {
   EXPECT_EQ("MCowBQYDK2VwAyEASY4IOzO2gIwbGN57fQagupnRw3JMIzhsYQgdyn9yyMk=",
             StringUtil::Base64Encode(GetSubjectPublicKey(*FixtureCertificate("ed25519"))));
 }

@@ -25,7 +25,7 @@ constexpr const char *NO_KEY = "The holder-of-key confirmation has no usable key
 struct Candidate {
   Confirmation confirmation;
   bool fits;
-  std::string reason; ///< if it is considered
+  std::string reason; ///< why it cannot be used, if its kind is considered
 };
 
 std::vector<Candidate> AllCandidates() {
@@ -39,7 +39,8 @@ std::vector<Candidate> AllCandidates() {
       {SenderVouches(), false, "Unknown subject confirmation method: 'urn:oasis:names:tc:SAML:2.0:cm:sender-vouches'"}};
 }
 
-/// What the rule says, in other words than the product: the position of the chosen one, or the refusal.
+/// The rule, written in another way than in the product. Returns the position of the chosen confirmation, or the
+/// refusal.
 std::string ExpectedChoice(const std::vector<Candidate> &order,
                            const boost::optional<SamlToken::ConfirmationType> &required) {
   const bool hasRequired = required && std::any_of(order.begin(), order.end(), [&](const Candidate &one) {
@@ -81,8 +82,8 @@ std::string Choice(const std::vector<Candidate> &order, const VerifyOptions &opt
   return std::to_string(assertion.details.usedConfirmation);
 }
 
-// Each set of confirmations in each order, with and without each required kind.
-TEST(ChooseConfirmation, ChoosesTheFirstBearerThatFitsAndElseTheFirstHolderOfKeyThatFits) {
+// Tries each set of confirmations in each order, with and without each required kind.
+TEST(ChooseConfirmation, ChoosesTheFirstUsableBearerOrOtherwiseTheFirstUsableHolderOfKey) {
   const std::vector<Candidate> candidates = AllCandidates();
   std::size_t tried = 0;
   for (unsigned chosen = 1; chosen < 1U << candidates.size(); ++chosen) {
@@ -109,12 +110,12 @@ TEST(ChooseConfirmation, ChoosesTheFirstBearerThatFitsAndElseTheFirstHolderOfKey
   EXPECT_EQ(325u, tried);
 }
 
-TEST(ChooseConfirmation, ChoosesTheFirstOfSeveralThatFit) {
+TEST(ChooseConfirmation, ChoosesTheFirstOfSeveralUsableConfirmations) {
   EXPECT_EQ("1", Choice({AllCandidates()[1], AllCandidates()[0], AllCandidates()[0]}, {}));
   EXPECT_EQ("1", Choice({AllCandidates()[3], AllCandidates()[2], AllCandidates()[2]}, {}));
 }
 
-TEST(ChooseConfirmation, TriesTheNextConfirmationIfOnlyAnOptionDoesNotFit) {
+TEST(ChooseConfirmation, TriesTheNextConfirmationIfAnOptionExcludesOne) {
   VerifyOptions options;
   options.acceptedRecipients = {"https://here/"};
   std::vector<Candidate> order(3, AllCandidates()[0]);

@@ -88,7 +88,7 @@ TEST_F(ConfirmationChoiceTest, AppliesTheDatesToAHolderOfKey) {
             RefusalOf(HolderOfKey().Until(AtSecond(-600))));
 }
 
-TEST_F(ConfirmationChoiceTest, AppliesTolerancesThatAreLongerThanAllTime) {
+TEST_F(ConfirmationChoiceTest, AppliesTolerancesThatAreLongerThanTheRangeOfDates) {
   Saml2Assertion assertion = AssertionWith({Bearer().From(DateTime("9999-12-31T23:59:58Z"))});
   assertion.common.Conditions.NotOnOrAfter = DateTime("9999-12-31T23:59:59Z");
   VerifyOptions options;
@@ -117,8 +117,8 @@ TEST_F(ConfirmationChoiceTest, ReportsByHowManySecondsTheClockMissesTheDates) {
   EXPECT_EQ(2, missed(Bearer().Until(AtSecond(-601))));
 }
 
-// With the tolerance, each date alone would be accepted.
-TEST_F(ConfirmationChoiceTest, RefusesDatesThatAreNeverThoseOfTheToken) {
+// With the tolerance, each of these dates on its own would be accepted.
+TEST_F(ConfirmationChoiceTest, RefusesDatesAtWhichTheTokenIsNeverValid) {
   EXPECT_EQ(UNSATISFIABLE_CONFIRMATION, RefusalOf(Bearer().From(AtSecond(10)).Until(AtSecond(10))));
   EXPECT_EQ("", RefusalOf(Bearer().From(AtSecond(10)).Until(AtSecond(11))));
   Saml2Assertion assertion = AssertionWith({Bearer().Until(AtSecond(-300))});
@@ -133,7 +133,7 @@ TEST_F(ConfirmationChoiceTest, RefusesDatesThatAreNeverThoseOfTheToken) {
   EXPECT_EQ("", Refusal(assertion, {}));
 }
 
-/// What a confirmation states (none: nothing), and the refusals for each kind if the options demand "wanted".
+/// What a confirmation states (`boost::none` if nothing), and the refusal of each kind if the options require "wanted".
 struct StatedCase {
   boost::optional<std::string> stated;
   std::string ofBearer;
@@ -183,7 +183,7 @@ TEST_F(ConfirmationChoiceTest, ComparesTheRequestByteForByteIfOptionsHaveOne) {
   }
 }
 
-TEST_F(ConfirmationChoiceTest, AnEmptyExpectedRequestIsNotTheSameAsNone) {
+TEST_F(ConfirmationChoiceTest, ComparesAnExpectedRequestThatIsEmpty) {
   VerifyOptions options;
   options.expectedInResponseTo = std::string();
   Confirmation confirmation = Bearer();
@@ -245,7 +245,7 @@ TEST_F(ConfirmationChoiceTest, ReportsEveryReasonInOrderToASinkThatDoesNotThrow)
   EXPECT_EQ(7u, full.unlisted);
 }
 
-TEST_F(ConfirmationChoiceTest, SaysThatAKindIsNotConsideredIfTheRequiredOneIsThere) {
+TEST_F(ConfirmationChoiceTest, RefusesAnotherKindIfTheTokenHasTheRequiredOne) {
   const Saml2Assertion assertion = AssertionWith({Bearer(), HolderOfKey(), SenderVouches()});
   VerifyOptions options;
   options.requiredConfirmation = SamlToken::HOLDER_OF_KEY;

@@ -1,5 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
-// The checks of a report: each fails alone, several fail at once, and some cannot be done.
+// The checks of a report: only one fails, several fail at once, or some cannot be done.
 
 #include "unit/token/explained_token.h"
 
@@ -78,7 +78,7 @@ TEST_F(ExplainChecks, WellFormedFailsWithThePlaceInTheText) {
   EXPECT_FALSE(report.claims.isAssertion);
 }
 
-TEST_F(ExplainChecks, FormFailsAlone) {
+TEST_F(ExplainChecks, OnlyTheFormFails) {
   const TokenReport report =
       Explain(Changed("<saml:AudienceRestriction>", "<saml:OneTimeUse/><saml:AudienceRestriction>"));
   EXPECT_EQ("form failed", NotPassed(report));
@@ -94,7 +94,7 @@ TEST_F(ExplainChecks, FormFailsAlone) {
   EXPECT_EQ("Deviations from the accepted form: 1. The profile SAML2 reads it.", report.Get(Check::FORM).summary);
 }
 
-TEST_F(ExplainChecks, IdentifiersFailAlone) {
+TEST_F(ExplainChecks, OnlyTheIdentifiersFail) {
   const TokenReport version = Explain(Changed(" Version=\"2.0\"", " Version=\"2.1\""));
   EXPECT_EQ("identifiers failed", NotPassed(version));
   EXPECT_EQ("Invalid token version", version.refusal);
@@ -168,7 +168,7 @@ TEST_F(ExplainChecks, AValidityCanFailInThreeWaysAtOnce) {
   EXPECT_EQ("The token has expired at: 2001-01-01T00:00:00.000Z", findings[2].message);
 }
 
-TEST_F(ExplainChecks, ConfirmationFailsAlone) {
+TEST_F(ExplainChecks, OnlyTheConfirmationFails) {
   const TokenReport report = Explain(Changed("Data NotOnOrAfter=\"2120-01-01", "Data NotOnOrAfter=\"2119-12-31"));
   EXPECT_EQ("confirmation failed", NotPassed(report));
   EXPECT_EQ("Invalid token subject validity", report.refusal);
@@ -181,7 +181,7 @@ TEST_F(ExplainChecks, ConfirmationFailsAlone) {
             finding.remedy);
 }
 
-TEST_F(ExplainChecks, DelegationFailsAlone) {
+TEST_F(ExplainChecks, OnlyTheDelegationFails) {
   const TokenReport other =
       Explain(Changed(":holder-of-key\"><saml:NameID Format=\"http://schemas.xmlsoap.org/claims/UPN\">"
                       "backup@corp.example<",
@@ -219,7 +219,7 @@ TEST_F(ExplainChecks, NamesReportEachNameThatCannotBeRead) {
   EXPECT_EQ("alice", report.claims.nameId.value());
 }
 
-TEST_F(ExplainChecks, AudienceFailsAlone) {
+TEST_F(ExplainChecks, OnlyTheAudienceFails) {
   VerifyOptions options;
   options.acceptedAudiences = {"urn:b", "urn:a"};
   const TokenReport report = Explain(TokenFixture("bearer"), options);
@@ -238,7 +238,7 @@ TEST_F(ExplainChecks, AudienceFailsAlone) {
             report.Get(Check::AUDIENCE).summary);
 }
 
-TEST_F(ExplainChecks, RequiredConfirmationFailsAlone) {
+TEST_F(ExplainChecks, OnlyTheRequiredConfirmationFails) {
   VerifyOptions options;
   options.requiredConfirmation = SamlToken::HOLDER_OF_KEY;
   const TokenReport report = Explain(TokenFixture("bearer"), options);

@@ -1,5 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
-// The claims of a report, which the token makes and which are not verified.
+// The claims in a report: what the token states, without verification.
 
 #include "unit/token/explained_token.h"
 
@@ -52,7 +52,7 @@ TEST_F(ExplainClaims, OfABearerTokenHaveNoCertificate) {
   EXPECT_TRUE(claims.groups.empty());
 }
 
-TEST_F(ExplainClaims, AreReportedAlsoWhenTheTokenIsRefused) {
+TEST_F(ExplainClaims, AreAlsoReportedWhenTheTokenIsRefused) {
   const std::string token = ReplaceOnce(TokenFixture("bearer"), ">alice@corp.example<", ">mallory@corp.example<");
   const TokenReport report = Explain(token);
   EXPECT_FALSE(report.accepted);

@@ -1,5 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
-// Reports in the profile SAML2, and what a report says about the other profile.
+// Reports in the profile SAML2, and what a report states about the other profile.
 
 #include "unit/token/explained_token.h"
 #include "unit/token/rich_assertion.h"
@@ -62,7 +62,7 @@ TEST_F(ExplainSaml2, AcceptsWhatTheProfileAccepts) {
   EXPECT_EQ("The confirmation is bearer; none is required.", Summary(report, Check::REQUIRED_CONFIRMATION));
 }
 
-TEST_F(ExplainSaml2, SaysWhichConfirmationIsUsedAndWhyTheOthersAreNot) {
+TEST_F(ExplainSaml2, StatesWhichConfirmationIsUsedAndWhyTheOthersAreNot) {
   EXPECT_EQ(
       "Confirmation 4 (bearer) of 4 is used; NotBefore 2026-01-02T00:00:00.000Z; NotOnOrAfter "
       "2026-01-03T00:00:00.000Z; Recipient \"https://sp.example/acs\", not checked; InResponseTo \"_request\", not "
@@ -72,7 +72,7 @@ TEST_F(ExplainSaml2, SaysWhichConfirmationIsUsedAndWhyTheOthersAreNot) {
       Summary(ExplainIn(RichToken()), Check::CONFIRMATION));
 }
 
-TEST_F(ExplainSaml2, DoesNotCallCheckedWhatWasNotChecked) {
+TEST_F(ExplainSaml2, DoesNotReportAsNotCheckedWhatTheOptionsRequire) {
   VerifyOptions options = Saml2Options();
   options.acceptedRecipients = {"https://sp.example/acs"};
   options.expectedInResponseTo = "_request";
@@ -85,7 +85,7 @@ TEST_F(ExplainSaml2, DoesNotCallCheckedWhatWasNotChecked) {
       << summary;
 }
 
-TEST_F(ExplainSaml2, SaysForEachOptionAloneWhatIsChecked) {
+TEST_F(ExplainSaml2, StatesWhatIsCheckedIfOnlyOneOptionIsSet) {
   VerifyOptions options = Saml2Options();
   options.expectedInResponseTo = "_request";
   const std::string request = Summary(ExplainIn(RichToken(), options), Check::CONFIRMATION);
@@ -179,7 +179,7 @@ TEST_F(ExplainSaml2, ClaimsThePeriodInWhichTheTokenCanBeUsed) {
   EXPECT_EQ(SamlToken::BEARER, claims.confirmation.value());
 }
 
-TEST_F(ExplainSaml2, AcceptsStrictTokensAndSaysThatStrictReadsThem) {
+TEST_F(ExplainSaml2, AcceptsStrictTokensAndStatesThatStrictReadsThem) {
   for (const std::string fixture : {"full", "bearer", "delegated", "holder-of-key", "bearer-minimal"}) {
     const TokenReport report = ExplainIn(TokenFixture(fixture));
     EXPECT_TRUE(report.accepted) << WriteTokenReport(report);
@@ -188,7 +188,7 @@ TEST_F(ExplainSaml2, AcceptsStrictTokensAndSaysThatStrictReadsThem) {
   }
 }
 
-TEST_F(ExplainSaml2, OfAStrictTokenSaysTheSameInBothProfiles) {
+TEST_F(ExplainSaml2, ClaimsTheSameForAStrictTokenInBothProfiles) {
   for (const std::string fixture : {"full", "delegated", "holder-of-key", "bearer-minimal"}) {
     const UnverifiedClaims strict = Explain(TokenFixture(fixture)).claims;
     EXPECT_EQ(DescribeClaims(strict), DescribeClaims(ExplainIn(TokenFixture(fixture)).claims)) << fixture;
@@ -196,7 +196,7 @@ TEST_F(ExplainSaml2, OfAStrictTokenSaysTheSameInBothProfiles) {
   }
 }
 
-TEST_F(ExplainSaml2, SaysInAStrictReportThatTheOtherProfileReadsTheForm) {
+TEST_F(ExplainSaml2, StatesInAStrictReportThatTheOtherProfileReadsTheForm) {
   const TokenReport report = Explain(RichToken());
   EXPECT_FALSE(report.accepted);
   EXPECT_EQ(report.refusal, report.Get(Check::FORM).findings.front().message);
@@ -210,16 +210,16 @@ TEST_F(ExplainSaml2, SaysInAStrictReportThatTheOtherProfileReadsTheForm) {
   EXPECT_EQ(3u, report.claims.details.value().usedConfirmation);
 }
 
-TEST_F(ExplainSaml2, ClaimsInAStrictReportThatNoConfirmationIsUsedIfNoneCanBe) {
+TEST_F(ExplainSaml2, ClaimsInAStrictReportWhichConfirmationIsUsedOrThatNoneIs) {
   const UnverifiedClaims claims =
       Explain(RichToken(Rich::BEARER + std::string("</saml:Subject>"), "</saml:Subject>")).claims;
-  EXPECT_EQ(2u, claims.details.value().usedConfirmation); // the key's holder
+  EXPECT_EQ(2u, claims.details.value().usedConfirmation); // the holder-of-key confirmation
   const TokenReport report = Explain(TokenFixture("expired"));
   EXPECT_EQ(1u, report.claims.details.value().confirmations.size());
   EXPECT_EQ(1u, report.claims.details->usedConfirmation);
 }
 
-TEST_F(ExplainSaml2, SaysNothingAboutADocumentAroundTheAssertion) {
+TEST_F(ExplainSaml2, DoesNotMentionTheOtherProfileForADocumentAroundTheAssertion) {
   for (const VerifyOptions &options : {VerifyOptions(), Saml2Options()}) {
     const TokenReport report = Explain("<envelope>" + RichToken() + "</envelope>", options);
     EXPECT_EQ(std::string::npos, Summary(report, Check::FORM).find("The profile")) << Summary(report, Check::FORM);
@@ -233,7 +233,7 @@ std::string Changed(const std::string &from, const std::string &to) {
   return SignAgain(ReplaceOnce(TokenFixture("bearer"), from, to));
 }
 
-TEST_F(ExplainSaml2, SaysInAStrictReportThatTheOtherProfileAcceptsTheNames) {
+TEST_F(ExplainSaml2, StatesInAStrictReportThatTheOtherProfileAcceptsTheNames) {
   const TokenReport report = Explain(Changed("Format=\"http://schemas.xmlsoap.org/claims/UPN\">alice",
                                              "Format=\"urn:oasis:names:tc:SAML:2.0:nameid-format:persistent\">alice"));
   EXPECT_EQ("names failed", NotPassed(report));
@@ -241,7 +241,7 @@ TEST_F(ExplainSaml2, SaysInAStrictReportThatTheOtherProfileAcceptsTheNames) {
             Summary(report, Check::NAMES));
 }
 
-TEST_F(ExplainSaml2, SaysInAStrictReportThatTheOtherProfileDoesNotAcceptTheNamesEither) {
+TEST_F(ExplainSaml2, StatesInAStrictReportThatTheOtherProfileDoesNotAcceptTheNamesEither) {
   const std::string solution =
       "<saml:Attribute Name=\"" SSOCLIENT_SOLUTION_AUTHORITY "/schemas/attr-names/2011/07/isSolution\"/>";
   const TokenReport report = Explain(Changed("<saml:AttributeStatement>", "<saml:AttributeStatement>" + solution));
@@ -252,7 +252,7 @@ TEST_F(ExplainSaml2, SaysInAStrictReportThatTheOtherProfileDoesNotAcceptTheNames
       Summary(report, Check::NAMES));
 }
 
-TEST_F(ExplainSaml2, SaysInAStrictReportThatTheOtherProfileAcceptsAShorterConfirmation) {
+TEST_F(ExplainSaml2, StatesInAStrictReportWhetherTheOtherProfileAcceptsAShorterConfirmation) {
   const std::string token = TokenFixture("bearer");
   const std::string data = "SubjectConfirmationData NotOnOrAfter=\"";
   const std::size_t end = token.find(data) + data.size();
@@ -269,7 +269,7 @@ TEST_F(ExplainSaml2, SaysInAStrictReportThatTheOtherProfileAcceptsAShorterConfir
       Summary(Explain(withEnd("2026-01-01T00:00:00Z")), Check::CONFIRMATION));
 }
 
-TEST_F(ExplainSaml2, SaysInAStrictReportWhetherTheOtherProfileAcceptsTheDelegate) {
+TEST_F(ExplainSaml2, StatesInAStrictReportWhetherTheOtherProfileAcceptsTheDelegate) {
   const std::string data = "<saml:SubjectConfirmationData ";
   const auto withDelegate = [&](const std::string &name) {
     return Changed(data,

@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// A signed assertion of the profile SAML2 that states everything that `TokenDetails` contain.
+/// A signed assertion of the profile SAML2 that states everything that `TokenDetails` has.
 
 #pragma once
 

@@ -1,7 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// `ParsedSaml2`, what the parser of the profile SAML2 reads and refuses, and changes of the assertions with which it is
-/// tested.
+/// `ParsedSaml2`, what the parser of the profile SAML2 reads and refuses, and the assertions with which it is tested.
 
 #pragma once
 
@@ -15,8 +14,8 @@
 
 namespace Testing {
 
-/// A document, and what a parse that continues after deviations read in it. The first deviation is compared with the
-/// exception of a verification.
+/// A document, and what the parser reads in it when it continues after deviations. The constructor also expects that
+/// the first deviation is the exception of a parser that does not continue.
 struct ParsedSaml2 {
   explicit ParsedSaml2(const std::string &text) : document(text) {
     deviations = DeviationsOf([&](SsoClient::DeviationSink &sink) {

@@ -56,7 +56,7 @@ std::vector<std::string> One(const std::string &message) {
   return {message};
 }
 
-TEST_F(CheckSaml2ValidityTest, IsThatOfTheProfileStrict) {
+TEST_F(CheckSaml2ValidityTest, IsTheSameAsInTheProfileStrict) {
   for (const auto &[from, to] : std::vector<std::pair<int, int>>{
            {600, 3600}, {601, 3600}, {-3600, -599}, {-3600, -600}, {10, 10}, {11, 10}, {601, -600}}) {
     const Saml2Assertion assertion = ValidBetween(AtSecond(from), AtSecond(to));
@@ -162,7 +162,7 @@ TEST_F(CheckSaml2DelegationTest, AcceptsOnlyTheLastDelegateIfThereIsARestriction
   }
 }
 
-TEST_F(CheckSaml2DelegationTest, TakesNoFormatForUnspecifiedAndIgnoresTheProvidedId) {
+TEST_F(CheckSaml2DelegationTest, TreatsNoFormatAsUnspecifiedAndIgnoresTheProvidedId) {
   NameId withoutFormat = DELEGATE;
   withoutFormat.format = boost::none;
   NameId unspecified = DELEGATE;
@@ -201,8 +201,8 @@ TEST(CheckAudienceRestrictions, RequiresAnAcceptedAudienceInEachRestriction) {
   EXPECT_EQ(std::vector<std::string>(), messages({{"urn:a"}}));
 }
 
-/// Removes the first mistake each time, so that the rules appear in their order.
-TEST_F(CheckSaml2PropertiesTest, RefusesByTheFirstRuleThatFails) {
+/// Each step corrects the mistake that was refused before, so the refusals are in the order of the rules.
+TEST_F(CheckSaml2PropertiesTest, RefusesWithTheFirstRuleThatFails) {
   Saml2Assertion assertion = WithSessions({AtSecond(-600)});
   Put(assertion, {Bearer().Until(AtSecond(-600))});
   assertion.details.confirmations[0].nameId = DELEGATE;

@@ -24,7 +24,7 @@ TEST(ReadNameId, ReadsEachAttribute) {
             ReadNameId(document.Root()));
 }
 
-TEST(ReadNameId, KeepsApartWhatIsAbsentAndWhatIsEmpty) {
+TEST(ReadNameId, DistinguishesAbsentAndEmptyAttributes) {
   const ParsedDocument document("<n Format=\"\" xmlns:p=\"urn:p\" p:NameQualifier=\"q\">v</n>");
   EXPECT_EQ((NameId{"v", std::string(), boost::none, boost::none, boost::none}), ReadNameId(document.Root()));
 }

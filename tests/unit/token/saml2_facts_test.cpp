@@ -55,7 +55,7 @@ TEST(ToPrincipalId, KeepsAUserPrincipalNameWithAQualifierWhole) {
             PrincipalOf(Named("alice@corp", UPN, boost::none, std::string("q"))));
 }
 
-// Otherwise an issuer of user principal names could write the principal of another format.
+// Otherwise a user principal name could have the same principal as a name of another format.
 TEST(ToPrincipalId, KeepsAUserPrincipalNameWholeIfItsDomainLooksLikeAFormat) {
   for (const std::string domain : {"nameid:persistent", "nameid:", "NameID:persistent",
                                    "name\xC4\xB1"
@@ -66,7 +66,7 @@ TEST(ToPrincipalId, KeepsAUserPrincipalNameWholeIfItsDomainLooksLikeAFormat) {
   EXPECT_EQ("alice | xnameid:persistent", PrincipalOf(Named("alice@xnameid:persistent", UPN)));
 }
 
-TEST(ToPrincipalId, NamesEachFormatOfTheStandardByItsKey) {
+TEST(ToPrincipalId, WritesEachFormatOfTheStandardAsItsKey) {
   const std::vector<std::pair<std::string, std::string>> formats{
       {SAML11_FORMAT + "unspecified", "unspecified"},
       {SAML11_FORMAT + "emailAddress", "email"},
@@ -106,7 +106,7 @@ TEST(ToPrincipalId, IgnoresTheProvidedId) {
   EXPECT_EQ("a | nameid:unspecified", PrincipalOf(nameId));
 }
 
-/// Values, and qualifiers and formats, that try to look like others.
+/// Values, qualifiers and formats that look like parts of other principals.
 std::vector<std::string> TrickyTexts() {
   return {"a",
           "b",
@@ -145,7 +145,7 @@ std::vector<std::string> TrickyTexts() {
           "a "};
 }
 
-/// Texts that differ by letter case too: in formats and qualifiers, letter case counts.
+/// Formats and qualifiers. Some differ only by letter case, which counts in formats and qualifiers.
 std::vector<MaybeText> TrickyAttributes() {
   std::vector<MaybeText> texts{boost::none,
                                std::string("A"),
@@ -164,8 +164,8 @@ std::vector<MaybeText> TrickyAttributes() {
   return texts;
 }
 
-// All pairs of value and attribute, for each of the three attributes and for two at once.
-TEST(ToPrincipalId, GivesDifferentPrincipalsToIdentifiersThatDifferByMoreThanLetterCaseOfTheValue) {
+// Tries each value with each format: without qualifiers, with each qualifier in either place, and with two qualifiers.
+TEST(ToPrincipalId, ReturnsDifferentPrincipalsForIdentifiersThatDifferByMoreThanLetterCaseOfTheValue) {
   std::set<PrincipalId, PrincipalIdLess> principals;
   std::size_t identifiers = 0;
   const auto add = [&](const NameId &nameId) {
@@ -188,7 +188,7 @@ TEST(ToPrincipalId, GivesDifferentPrincipalsToIdentifiersThatDifferByMoreThanLet
   EXPECT_LT(200000u, identifiers);
 }
 
-TEST(ToPrincipalId, GivesEqualPrincipalsToValuesThatDifferByLetterCaseOnly) {
+TEST(ToPrincipalId, ReturnsEqualPrincipalsForValuesThatDifferByLetterCaseOnly) {
   const PrincipalId mixed = ToPrincipalId(Named("aB", SAML20_FORMAT + "persistent"));
   EXPECT_EQ(ToPrincipalId(Named("Ab", SAML20_FORMAT + "persistent")), mixed);
   EXPECT_EQ("aB", mixed.name);
@@ -217,14 +217,14 @@ TEST(TakeCommonAudiences, IsTheIntersectionOfAllRestrictions) {
   EXPECT_EQ(Audiences{"urn:b"}, CommonOf({{"urn:a", "urn:b"}, {"urn:b", "urn:c", "urn:d"}, {"urn:b", "urn:a"}}));
 }
 
-TEST(TakeCommonAudiences, NamesAllRestrictionsInOneTextIfNoAudienceMeetsThem) {
+TEST(TakeCommonAudiences, WritesAllRestrictionsInOneTextIfNoAudienceIsInAllOfThem) {
   using Audiences = std::set<std::string>;
   EXPECT_EQ(Audiences{"(urn:a) and (urn:b)"}, CommonOf({{"urn:a"}, {"urn:b"}}));
   EXPECT_EQ(Audiences{"(urn:a, urn:b) and (urn:c) and (urn:a)"}, CommonOf({{"urn:b", "urn:a"}, {"urn:c"}, {"urn:a"}}));
   EXPECT_EQ(Audiences{"(urn:c) and (urn:a, urn:b)"}, CommonOf({{"urn:c"}, {"urn:b", "urn:a"}}));
 }
 
-/// Chooses the confirmation, and takes the facts.
+/// Chooses the confirmation, and returns the facts of the assertion.
 TokenFacts FactsOfAssertion(Saml2Assertion assertion) {
   VerifyOptions options;
   options.clockToleranceSec = 1000000;
@@ -244,7 +244,7 @@ Saml2Assertion WithAttribute(const std::string &name, const std::vector<std::str
 constexpr const char *GROUP = SSOCLIENT_EXTENSION_AUTHORITY "/schemas/attr-names/2009/01/GroupIdentity";
 constexpr const char *SOLUTION = SSOCLIENT_SOLUTION_AUTHORITY "/schemas/attr-names/2011/07/isSolution";
 
-TEST(TakeSaml2Facts, TakesIdentifierSubjectAndConfirmation) {
+TEST(TakeSaml2Facts, ReturnsIdentifierSubjectAndConfirmation) {
   Saml2Assertion assertion = AssertionWith({HolderOfKey()});
   assertion.common.Conditions.RenewRestriction = RenewRestrictionType{1};
   assertion.common.Conditions.ProxyRestriction = ProxyRestrictionType{1};
@@ -271,7 +271,7 @@ TEST(TakeSaml2Facts, IsNeitherRenewableNorDelegableWithoutACountThatAllowsAUse) 
   }
 }
 
-TEST(TakeSaml2Facts, HasNoCertificateForAHolderOfKeyThatStatesAKeyOnlyNorForABearer) {
+TEST(TakeSaml2Facts, HasNoCertificateForABearerOrForAHolderOfKeyWithOnlyAKey) {
   Confirmation keyOnly = HolderOfKey();
   keyOnly.details.certificate = nullptr;
   EXPECT_EQ(nullptr, FactsOfAssertion(AssertionWith({keyOnly})).confirmationCertificate);
@@ -293,7 +293,7 @@ TEST(TakeSaml2Facts, HasTheDatesWithinWhichTheTokenCanBeUsed) {
   EXPECT_EQ(AtSecond(3600), facts.endDate);
 }
 
-TEST(TakeSaml2Facts, TakesEachDelegateWithItsQualifiers) {
+TEST(TakeSaml2Facts, ReturnsEachDelegateWithItsQualifiers) {
   Saml2Assertion assertion = Delegated({}, {SUBJECT, DELEGATE});
   assertion.common.Conditions.DelegationRestriction->delegates[0].DelegationInstant = AtSecond(1);
   const TokenFacts facts = FactsOfAssertion(assertion);
@@ -311,7 +311,7 @@ TEST(TakeSaml2Facts, LeavesOutADelegateWithoutAName) {
   EXPECT_EQ(ToPrincipalId(DELEGATE), facts.delegationChain[0].subject);
 }
 
-TEST(TakeSaml2Facts, TakesAGroupWithAndWithoutADomain) {
+TEST(TakeSaml2Facts, ReturnsGroupsWithAndWithoutADomain) {
   const TokenFacts facts = FactsOfAssertion(WithAttribute(GROUP, {"users", "CORP\\admins", "a@b", "A\\B\\C"}));
   std::vector<std::string> groups;
   for (const PrincipalId &group : facts.groups) {
@@ -329,14 +329,14 @@ TEST(TakeSaml2Facts, RefusesAnEmptyGroupAndABackslashWithoutDomainOrName) {
   }
 }
 
-TEST(TakeSaml2Facts, RefusesAGroupWithoutADomainInTheProfileStrictOnly) {
+TEST(TakeAttributes, RefusesAGroupWithoutADomain) {
   SamlAssertionType assertion = std::move(WithAttribute(GROUP, {"users"}).common);
   TokenFacts facts;
   EXPECT_THROWS_MESSAGE(TakeAttributes(assertion, facts, ThrowingSink()), ParseException,
                         "Failed to parse Group Identity value: `users'; domain or group missing");
 }
 
-TEST(TakeSaml2Facts, ReadsTheSolutionAttributeAsTheProfileStrict) {
+TEST(TakeSaml2Facts, ReadsTheSolutionAttributeLikeTheProfileStrict) {
   EXPECT_TRUE(FactsOfAssertion(WithAttribute(SOLUTION, {"True"})).solution);
   EXPECT_FALSE(FactsOfAssertion(WithAttribute(SOLUTION, {"1"})).solution);
   EXPECT_THROWS_MESSAGE(FactsOfAssertion(WithAttribute(SOLUTION, {})), ParseException,

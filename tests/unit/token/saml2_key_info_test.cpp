@@ -172,7 +172,7 @@ TEST(ParseKeyInfo, IgnoresWhatIsNotAKey) {
   EXPECT_EQ(KeyOf(HOLDER), Read(KeyInfo(withSerial)).publicKey);
 }
 
-TEST(ParseKeyInfo, HasNoKeyWithoutOneThatCanBeUsed) {
+TEST(ParseKeyInfo, HasNoKeyIfNoneCanBeUsed) {
   ExpectNoKey("");
   ExpectNoKey(KeyInfo(""));
   ExpectNoKey(KeyInfo("<ds:X509Data/><ds:KeyValue/>"));

@@ -22,7 +22,7 @@ using ::testing::SizeIs;
 
 const std::string XSI_LOCATIONS = R"(xsi:schemaLocation="urn:a a.xsd" xsi:noNamespaceSchemaLocation="b.xsd" )";
 
-/// An assertion as the stock token service of Apache CXF writes it.
+/// An assertion like those of a stock token service of Apache CXF.
 std::string CxfAssertion() {
   return R"(<saml2:Assertion xmlns:saml2="urn:oasis:names:tc:SAML:2.0:assertion")"
          R"( xmlns:xsd="http://www.w3.org/2001/XMLSchema" xmlns:xsi="http://www.w3.org/2001/XMLSchema-instance")"
@@ -117,7 +117,7 @@ TEST(ParseSaml2AssertionElement, ReadsTheIssuerWithItsQualifiers) {
   EXPECT_EQ((NameIDType{"", "the issuer"}), read.common.Issuer);
 }
 
-TEST(ParseSaml2AssertionElement, AcceptsAnEmptyFormatOfTheIssuerAsTheStrictProfileDoes) {
+TEST(ParseSaml2AssertionElement, AcceptsAnEmptyFormatOfTheIssuerLikeTheStrictProfile) {
   const Accepted read = AcceptedSaml2(ChangedBearer("urn:format:issuer", ""));
   EXPECT_EQ(std::string(), read.details.issuer.format);
 }
@@ -263,7 +263,7 @@ TEST(ParseSaml2AssertionElement, ReadsARenewRestriction) {
   EXPECT_EQ(5u, read.common.Conditions.RenewRestriction->Count.value());
 }
 
-TEST(ParseSaml2AssertionElement, ReadsItsOwnAdviceAndIgnoresOther) {
+TEST(ParseSaml2AssertionElement, ReadsTheAdviceOfTheExtensionAndIgnoresOtherAdvice) {
   const Accepted read = AcceptedSaml2(AssertionStating(
       "<saml:Advice><saml:AssertionIDRef>_x</saml:AssertionIDRef><saml:AssertionURIRef>urn:x</saml:AssertionURIRef>"
       "<saml:Assertion/><saml:EncryptedAssertion/><any xmlns='urn:x'>text</any>" +
@@ -344,7 +344,7 @@ TEST(ParseSaml2AssertionElement, ReservesMemoryForTheAttributesOfAllStatementsOn
   EXPECT_EQ(10u, read.common.AttributeStatement->attributes.capacity());
 }
 
-TEST(ParseSaml2AssertionElement, HasNoStatementsWhenThereAreNone) {
+TEST(ParseSaml2AssertionElement, HasNoStatementsIfTheAssertionHasNone) {
   const Accepted read = AcceptedSaml2(AssertionStating(""));
   EXPECT_FALSE(read.common.AttributeStatement);
   EXPECT_TRUE(read.details.authnStatements.empty());

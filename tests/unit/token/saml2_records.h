@@ -17,7 +17,7 @@
 
 namespace Testing {
 
-/// The time of the tests, 2026-01-02T03:04:05.006Z, and `second` seconds.
+/// The time of the tests, 2026-01-02T03:04:05.006Z, plus `second` seconds.
 Tarvel::System::DateTime AtSecond(std::int64_t second);
 
 /// A confirmation: what the rules use, and what the token states.
@@ -25,17 +25,17 @@ struct Confirmation {
   SsoClient::Saml2Confirmation record;
   SsoClient::ConfirmationDetails details;
 
-  /// The same with a limit.
+  /// The same confirmation with a start, or with an end.
   Confirmation From(const Tarvel::System::DateTime &notBefore) const;
   Confirmation Until(const Tarvel::System::DateTime &notOnOrAfter) const;
 };
 
-/// Confirmations without limits. That of a holder of key has a certificate, and that of sender-vouches is not known.
+/// Confirmations without dates. `HolderOfKey` has a certificate, and the method of `SenderVouches` is always refused.
 Confirmation Bearer();
 Confirmation HolderOfKey();
 Confirmation SenderVouches();
 
-/// An assertion with these confirmations, about `SUBJECT`, that is valid from an hour ago for two hours.
+/// An assertion about `SUBJECT`, with these confirmations. It is valid for two hours, and one of them has passed.
 SsoClient::Saml2Assertion AssertionWith(const std::vector<Confirmation> &confirmations);
 
 /// Replaces the confirmations. None of them is chosen.
@@ -45,17 +45,17 @@ void Put(SsoClient::Saml2Assertion &assertion, const std::vector<Confirmation> &
 SsoClient::Saml2Assertion ValidBetween(const Tarvel::System::DateTime &notBefore,
                                        const Tarvel::System::DateTime &notOnOrAfter);
 
-/// A bearer assertion with these ends of sessions. Each statement that has none is `boost::none`.
+/// A bearer assertion with one statement for each end of a session; `boost::none` for a statement without an end.
 SsoClient::Saml2Assertion WithSessions(const std::vector<boost::optional<Tarvel::System::DateTime>> &ends);
 
 extern const SsoClient::NameId SUBJECT;
 extern const SsoClient::NameId DELEGATE;
 
-/// `nameId` with another value, format or qualifier.
+/// Copies of `nameId`, each with another value, format or qualifier.
 std::vector<SsoClient::NameId> IdentifiersThatDifferFrom(const SsoClient::NameId &nameId);
 
-/// A bearer assertion whose confirmation, which is chosen, is that of the party `confirming`, and with these delegates. If there
-/// are none, there is no delegation restriction.
+/// A bearer assertion with these delegates; without any, it has no delegation restriction. Its confirmation has been
+/// chosen, and states the party `confirming`.
 SsoClient::Saml2Assertion Delegated(const boost::optional<SsoClient::NameId> &confirming,
                                     const std::vector<SsoClient::NameId> &delegates);
 

@@ -97,7 +97,7 @@ TEST_F(Saml2VerifierTest, AcceptsAnElementOfALargerDocument) {
   EXPECT_EQ("alice@corp", AsImpl(*token).GetNameId().value);
 }
 
-TEST_F(Saml2VerifierTest, GivesEveryFixtureOfTheProfileStrictTheSameFacts) {
+TEST_F(Saml2VerifierTest, ReadsTheSameFactsAsTheProfileStrictInEveryFixture) {
   const Tarvel::ScopedEnvironment clock({[] { return DateTime("2026-01-02T03:04:05Z").GetUtcTime(); }, {}});
   const auto trusted = TokenCertificates({"sts-rsa", "sts-rsa-2", "sts-ec256", "sts-rsa3072"});
   const TokenVerifier strict(trusted);
@@ -146,7 +146,7 @@ TEST_F(Saml2VerifierTest, StatesTheIdentifierOfATokenOfTheProfileStrictAsAUserPr
   EXPECT_EQ(AsImpl(*token).GetNameId(), AsImpl(*Verify(strictForm)).GetNameId());
 }
 
-TEST_F(Saml2VerifierTest, UsesTheFirstConfirmationThatFitsTheOptions) {
+TEST_F(Saml2VerifierTest, UsesTheFirstBearerThatMatchesTheOptionsOrOtherwiseTheHolderOfKey) {
   const std::string confirmations = Piece::Confirmation("sender-vouches", "") +
                                     Piece::Confirmation("holder-of-key", Piece::HolderOfKeyData()) +
                                     BearerWith(R"(Recipient="https://there/" InResponseTo="_1")") +
@@ -182,7 +182,7 @@ TEST_F(Saml2VerifierTest, HasTheCertificateOfTheHolderOfKeyThatIsUsed) {
   EXPECT_EQ(nullptr, Verify(AssertionConfirmedBy(holderOfKey + BearerWith("")))->GetConfirmationCertificate());
 }
 
-TEST_F(Saml2VerifierTest, EndsWhenTheConfirmationOrASessionEnds) {
+TEST_F(Saml2VerifierTest, EndsATokenWhenTheConfirmationOrASessionEnds) {
   const std::string confirmation =
       BearerWith(R"(NotBefore="2026-01-01T00:30:00Z" NotOnOrAfter="2026-01-01T03:00:00Z")");
   auto token = Verify(AssertionConfirmedBy(confirmation));
@@ -192,7 +192,7 @@ TEST_F(Saml2VerifierTest, EndsWhenTheConfirmationOrASessionEnds) {
   EXPECT_EQ(DateTime("2026-01-01T05:00:00Z"), token->GetEndDate());
 }
 
-TEST_F(Saml2VerifierTest, StartsWhenItWasIssuedIfTheConditionsDoNotSay) {
+TEST_F(Saml2VerifierTest, StartsATokenWhenItWasIssuedIfTheConditionsHaveNoStart) {
   const std::string assertion = ReplaceOnce(Bearer(""), " NotBefore=\"2026-01-01T00:00:00Z\"", "");
   EXPECT_EQ(DateTime("2026-01-01T00:00:00Z"), Verify(assertion)->GetStartDate());
   ExpectRefusal(
@@ -229,7 +229,7 @@ TEST_F(Saml2VerifierTest, RequiresAnAcceptedAudienceInEachRestriction) {
   ExpectRefusal("The token is not restricted to an audience", Bearer(""), options);
 }
 
-TEST_F(Saml2VerifierTest, RequiresAConfirmationThatTheTokenDoesNotHave) {
+TEST_F(Saml2VerifierTest, RefusesATokenWithoutTheRequiredConfirmation) {
   VerifyOptions options = Saml2();
   options.requiredConfirmation = SamlToken::HOLDER_OF_KEY;
   ExpectRefusal("The token's confirmation is bearer, but holder-of-key is required",

@@ -101,7 +101,7 @@ TEST_F(TokenDetailsTest, HaveAllConfirmationsAndWhichIsUsed) {
   EXPECT_TRUE(used.publicKey.empty());
 }
 
-TEST_F(TokenDetailsTest, NameTheConfirmationThatTheOptionsChose) {
+TEST_F(TokenDetailsTest, StateWhichConfirmationTheOptionsChose) {
   VerifyOptions options = Saml2Options();
   options.requiredConfirmation = SamlToken::HOLDER_OF_KEY;
   EXPECT_EQ(2u, GetTokenDetails(*Verified(RichToken(), options)).usedConfirmation);
@@ -193,7 +193,7 @@ TEST_F(TokenDetailsTest, OfAStrictTokenHaveAllThatItStates) {
   EXPECT_EQ("corp.example\\Ops\\Night Shift", details.attributes.front().values.at(2).text);
 }
 
-TEST_F(TokenDetailsTest, OfATokenInADocumentAreThoseOfItsCanonicalForm) {
+TEST_F(TokenDetailsTest, AreTheSameForATokenInALargerDocument) {
   const std::string xml = RichToken();
   const ParsedDocument document("<envelope>" + xml + "</envelope>");
   const auto token =

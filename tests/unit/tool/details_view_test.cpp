@@ -130,7 +130,7 @@ Attribute:       gone
             LinesOf(Details()));
 }
 
-TEST(DetailLines, AreNoneForAPlainToken) {
+TEST(DetailLines, AreEmptyForAPlainToken) {
   TokenDetails details;
   details.confirmations.emplace_back();
   details.authnStatements.emplace_back();

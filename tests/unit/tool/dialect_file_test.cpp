@@ -57,7 +57,7 @@ TEST_F(DialectFile, SetsEachSwitch) {
   EXPECT_TRUE(dialect.acceptsAnyResponse);
 }
 
-TEST_F(DialectFile, KnowsEachValue) {
+TEST_F(DialectFile, ReadsTheOtherValuesOfTheSwitches) {
   EXPECT_FALSE(Read(R"({"base": "cxf", "charset": "none"})").declaresCharset);
   EXPECT_FALSE(Read(R"({"applies-to": "none"})").appliesTo);
   EXPECT_EQ(Statement::ALWAYS, Read(R"({"base": "cxf", "delegatable": "always"})").delegatable);
@@ -69,7 +69,7 @@ TEST_F(DialectFile, KnowsEachValue) {
   EXPECT_TRUE(Read(R"({"base": "cxf", "credential-faults": []})").credentialFaults.empty());
 }
 
-TEST_F(DialectFile, ChangesItsBaseWhereverTheKeyIs) {
+TEST_F(DialectFile, ChangesItsBaseEvenIfTheBaseIsTheLastKey) {
   EXPECT_EQ(WriteDialect(GetServiceDialect("cxf")), WriteDialect(Read(R"({"base": "cxf"})")));
   const ServiceDialect dialect = Read(R"({"delegatable": "when-true", "base": "cxf"})");
   EXPECT_EQ(Statement::WHEN_TRUE, dialect.delegatable);

@@ -308,7 +308,7 @@ TEST(ReportText, HasColoursOnlyForOutcomesAndOnlyIfAsked) {
   EXPECT_THAT(ReportText({report}, PLAIN), Not(HasSubstr("\033")));
 }
 
-TEST(ReportText, DoesNotBlameAKeyForASignatureThatIsNotThere) {
+TEST(ReportText, ShowsThatAKeyWasNotTriedIfTheSignaturesAlgorithmIsNotKnown) {
   TokenReport report = Passed();
   report.signatureAlgorithm.clear();
   report.trustedKeys.resize(1);

@@ -23,7 +23,7 @@ TokenSpec SpecFor(std::int64_t lifetimeSec) {
   return spec;
 }
 
-/// A token that is, by default, valid for an hour from the moment when it was asked for.
+/// The facts of a token that is, by default, valid for an hour from the time of the request.
 TokenFacts HourFrom(const char *start = "2026-01-01T12:00:00Z", const char *end = "2026-01-01T13:00:00Z") {
   TokenFacts facts;
   facts.startDate = DateTime(start);
@@ -96,7 +96,7 @@ TEST(FindUnmet, AcceptsATokenWithMoreThanWasAskedFor) {
   EXPECT_THAT(FindUnmet(SpecFor(3600), ServiceDialect(), ASKED_AT, facts, 0), IsEmpty());
 }
 
-TEST(FindUnmet, ComparesTheLastDelegateWithoutLetterCase) {
+TEST(FindUnmet, IgnoresLetterCaseInTheLastDelegate) {
   TokenSpec spec = SpecFor(3600);
   spec.delegateTo = "Bob@CORP.example";
   TokenFacts facts = HourFrom();
@@ -142,7 +142,7 @@ TEST(FindUnmet, RequiresExactlyTheAudienceThatWasAskedFor) {
   EXPECT_THAT(WantedOf(spec, facts), ElementsAre("restriction to the audience a, b; the token is for a, b, c"));
 }
 
-TEST(FindUnmet, WantsATokenAboutTheOtherPartyAndNoDelegationOnBehalfOfThatParty) {
+TEST(FindUnmet, OnBehalfOfAnotherPartyRequiresATokenAboutThatPartyAndNoDelegation) {
   ServiceDialect dialect;
   dialect.delegation = ServiceDialect::Delegation::ON_BEHALF_OF;
   TokenSpec spec = SpecFor(3600);
@@ -176,13 +176,13 @@ TEST(FindUnmet, ComparesTheWholeNameOfAnIdentifierThatIsNotSplit) {
   spec.delegateTo = "bob@nameid:unspecified";
   EXPECT_THAT(WantedOf(spec, facts, dialect),
               ElementsAre("a token about bob@nameid:unspecified; the token is about bob"));
-  // Without such a domain, the last at-sign separates the domain.
+  // If the token's domain does not begin with "nameid:", the last at-sign separates the name and the domain.
   spec.delegateTo = "a@b";
   facts.subject = PrincipalId{"a@b", "corp.example"};
   EXPECT_THAT(WantedOf(spec, facts, dialect), ElementsAre("a token about a@b; the token is about a@b@corp.example"));
 }
 
-TEST(FindUnmet, DoesNotCheckWhereATokenNamesThePartyAsWhichToAct) {
+TEST(FindUnmet, DoesNotCheckThePartyOfActAs) {
   ServiceDialect dialect;
   dialect.delegation = ServiceDialect::Delegation::ACT_AS;
   TokenSpec spec = SpecFor(3600);
@@ -224,7 +224,7 @@ const Life LIVES[] = {
     {"Longer", "2026-01-01T12:00:00Z", "2026-01-01T14:00:00Z", 0, true},
     {"ShorterByAlmostTwoSeconds", "2026-01-01T12:00:01.500Z", "2026-01-01T12:59:58.001Z", 0, true},
     {"ShorterByTwoSeconds", "2026-01-01T12:00:00Z", "2026-01-01T12:59:58Z", 0, false},
-    {"ShorterByTwoSecondsWhateverTheTolerance", "2026-01-01T12:00:00Z", "2026-01-01T12:59:58Z", 600, false},
+    {"ShorterByTwoSecondsDespiteTheTolerance", "2026-01-01T12:00:00Z", "2026-01-01T12:59:58Z", 600, false},
     {"ClockOfTheServiceAheadAndEndAsRequested", "2026-01-01T12:05:00Z", "2026-01-01T13:00:00Z", 0, true},
     {"ClockOfTheServiceAhead", "2026-01-01T12:05:00Z", "2026-01-01T13:05:00Z", 0, true},
     {"ClockOfTheServiceBehindAndEndAsRequested", "2026-01-01T11:50:00Z", "2026-01-01T13:00:00Z", 0, true},

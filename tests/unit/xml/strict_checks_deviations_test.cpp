@@ -1,5 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
-// What the strict checks report to a sink that does not throw. DeviationsOf compares the first one with the exception.
+// What the strict checks report to a sink that does not throw. DeviationsOf also expects that the first deviation is
+// the exception of a sink that throws.
 #include "xml/strict_checks.h"
 
 #include "support/parsed_document.h"
@@ -98,7 +99,7 @@ TEST(RequireElementAttributesNames, ReportsMissingAttributesFirstThenEachUnexpec
             }));
 }
 
-TEST(RequireElementAttributesNames, ShortensAValue) {
+TEST(RequireNoAttributes, ShortensAValue) {
   const ParsedDocument document("<r A='" + std::string(5000, 'x') + "'/>");
   const Deviations found = DeviationsOf([&](DeviationSink &sink) { RequireNoAttributes(document.Root(), sink); });
   ASSERT_EQ(1u, found.size());

@@ -1,5 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
-// Prints what OpenSAML reads of an assertion, one fact a line, so that another reader can be compared with it.
+// Prints what OpenSAML reads in an assertion, one fact on each line. The tests compare our reader with it.
 
 import java.security.MessageDigest;
 import java.security.PublicKey;

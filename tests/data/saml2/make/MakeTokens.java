@@ -1,5 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
-// Makes signed assertions with OpenSAML and WSS4J, and details.txt, which says what OpenSAML reads of each of them.
+// Makes signed assertions with OpenSAML and WSS4J, and details.txt, which has what OpenSAML reads in each of them.
 // usage: java MakeTokens TOKEN_FOLDER OUT_FOLDER     TOKEN_FOLDER has the keys; see make.sh
 
 import java.io.InputStream;
@@ -73,7 +73,7 @@ public class MakeTokens {
     return "_" + HexFormat.of().formatHex(digest).substring(0, 32);
   }
 
-  // A bearer token that says as little as the profile allows.
+  // A bearer token that states as little as the profile allows.
   static Assertion plain(String name) throws Exception {
     Assertion assertion = make(Assertion.DEFAULT_ELEMENT_NAME);
     assertion.setVersion(SAMLVersion.VERSION_20);
@@ -215,7 +215,7 @@ public class MakeTokens {
     return any;
   }
 
-  // Signs, writes NAME.xml, reads it again and adds what OpenSAML reads of it to the details.
+  // Signs the assertion, writes NAME.xml, reads the file again, and adds what OpenSAML reads in it to the details.
   static void sign(String name, Assertion assertion) throws Exception {
     BasicX509Credential credential = new BasicX509Credential(certificate("sts-rsa"), key("sts-rsa"));
     Signature signature = make(Signature.DEFAULT_ELEMENT_NAME);

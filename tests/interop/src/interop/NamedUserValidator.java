@@ -10,8 +10,8 @@ import org.apache.cxf.ws.security.sts.provider.model.secext.UsernameTokenType;
 import org.apache.wss4j.common.principal.CustomTokenPrincipal;
 
 /**
- * Which users `wst:OnBehalfOf` and `wst14:ActAs` may name without a password. CXF's own validator of names requires the password
- * of the represented user; a deployer that permits delegation by name decides it here.
+ * Decides which users `wst:OnBehalfOf` and `wst14:ActAs` may name without a password, for a deployer that permits delegation
+ * by name. CXF's own validator of names requires the password of the represented user.
  */
 final class NamedUserValidator implements TokenValidator {
   private final Users users;

@@ -98,14 +98,14 @@ public final class TokenService {
   }
 
   private void publishAll() {
-    // Without a policy, an interceptor lists what a header has to have.
+    // Without a policy, an interceptor lists what a header must have.
     publishPlain("/plain/ut", "Timestamp UsernameToken");
     publishPlain("/plain/x509", "Timestamp Signature");
     publishPlain("/plain/ut-x509", "Timestamp UsernameToken Signature");
     publishPlain("/plain/saml", "Timestamp Signature SAMLTokenSigned");
     publishPlain("/plain/timestamp", "Timestamp");
 
-    // With a policy, the WSDL has it: what is written here is what WS-SecurityPolicy has no words for.
+    // With a policy, the WSDL states it. Only what WS-SecurityPolicy cannot express is written here.
     publishPolicy("/sts", "sts", Map.of());
     publishPolicy("/ut", "ut", Map.of());
     publishPolicy("/x509", "x509", Map.of());
@@ -181,7 +181,7 @@ public final class TokenService {
     return new SAMLTokenValidator();
   }
 
-  /** The services for which a token may be asked by `wsp:AppliesTo`. */
+  /** The services to which `wsp:AppliesTo` may refer. */
   private static StaticService knownService() {
     final StaticService service = new StaticService();
     service.setEndpoints(List.of("https://app\\.example/.*"));

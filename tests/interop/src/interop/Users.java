@@ -12,8 +12,8 @@ import javax.security.auth.callback.CallbackHandler;
 import org.apache.wss4j.common.ext.WSPasswordCallback;
 
 /**
- * The users: a file with lines of a name, a password and any number of groups, with a tab between them. The callback is how
- * WSS4J asks a deployer for the password of a user, and for that of the service's key.
+ * The users: a file with lines of a name, a password and any number of groups, with a tab between them. WSS4J calls the
+ * handler for the password of a user, and for the password of the service's key.
  */
 final class Users implements CallbackHandler {
   private final Map<String, List<String>> users = new HashMap<>();

@@ -14,7 +14,7 @@ import org.w3c.dom.Node;
 /** Changes to a signed request that a service must notice. */
 final class EnvelopeChanges {
   private interface Change {
-    /** Returns whether the request has what is to be changed. */
+    /** Returns false if the request does not have what the change replaces. */
     boolean apply(Document document) throws Exception;
   }
 
@@ -122,7 +122,7 @@ final class EnvelopeChanges {
     return !references.isEmpty();
   }
 
-  /** The signed body stays in the message, where nobody reads it. Another body is in its place. */
+  /** The signed body stays in the message, but the service does not read it. Another body is in its place. */
   private static boolean moveBodyAside(Document document) {
     Element signed = body(document);
     Element other = (Element) signed.cloneNode(true);

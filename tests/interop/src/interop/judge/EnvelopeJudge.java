@@ -53,7 +53,7 @@ final class EnvelopeJudge {
   private static final String ENVELOPED = "http://www.w3.org/2000/09/xmldsig#enveloped-signature";
   private static final int SHORTEST_KEY = 2048;
 
-  /** What a request must have: which users, and whether it is signed. */
+  /** Whether a request must be signed, must have a user name, and must follow the Basic Security Profile. */
   record Expected(boolean isSigned, boolean hasUsername, boolean followsBasicSecurityProfile) {
   }
 
@@ -65,7 +65,7 @@ final class EnvelopeJudge {
     this.passwords = passwords;
   }
 
-  /** VERIFIES, or the reason why not. */
+  /** Returns VERIFIES, or the reason for which the request does not verify. */
   String judgeAsTree(String envelope, Expected expected) {
     try {
       Document document = Xml.parse(envelope);
@@ -81,7 +81,7 @@ final class EnvelopeJudge {
     }
   }
 
-  /** The same with the engine that reads a stream. */
+  /** Judges with the engine that reads a stream. */
   String judgeAsStream(String envelope, Expected expected) {
     List<SecurityEvent> events = new ArrayList<>();
     try {
@@ -136,7 +136,7 @@ final class EnvelopeJudge {
     };
   }
 
-  /** The elements that must be signed: no more and no fewer. */
+  /** The elements that must be signed. No other element may be signed. */
   private static Set<Element> mustBeSigned(Document document) {
     Set<Element> wanted = Collections.newSetFromMap(new IdentityHashMap<>());
     Element envelope = document.getDocumentElement();

@@ -17,7 +17,7 @@ import java.util.List;
 
 /** A private key and its certificate, and the file of the certificate. */
 record Identity(PrivateKey key, X509Certificate certificate, Path certificateFile) {
-  /** Makes one with openssl. The key is given as arguments of "openssl req -newkey". */
+  /** Makes an identity with openssl. `newKey` is the key, as arguments of "openssl req -newkey". */
   static Identity make(Path folder, String name, String... newKey) throws Exception {
     Path keyFile = folder.resolve(name + ".key");
     Path certificateFile = folder.resolve(name + ".crt");

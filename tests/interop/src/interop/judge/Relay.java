@@ -14,7 +14,7 @@ import java.net.http.HttpResponse;
 import java.util.concurrent.LinkedBlockingQueue;
 import javax.net.ssl.SSLContext;
 
-/** An HTTPS server on loopback that hands each request on unchanged, and keeps it. */
+/** An HTTPS server on loopback that passes each request on unchanged, and keeps it. */
 final class Relay implements AutoCloseable {
   /** A request: its Content-Type and its body. */
   record Request(String contentType, byte[] body) {

@@ -14,7 +14,7 @@ import javax.net.ssl.SSLContext;
 
 /** Judges the requests of the tool: each operation in each dialect, and changed copies of the signed ones. */
 final class RequestJudgement {
-  /** What an operation's request has. */
+  /** An operation: what its request has, and the arguments of the tool. */
   private record Operation(String name, boolean isSigned, boolean hasUsername, List<String> arguments) {
   }
 
@@ -39,7 +39,7 @@ final class RequestJudgement {
     this.folder = folder;
   }
 
-  /** The tokens that the service issued, under what they are. */
+  /** The tokens that the service issued, each under the name of the operation. */
   Map<String, String> tokens() {
     return tokens;
   }
@@ -58,7 +58,7 @@ final class RequestJudgement {
     }
   }
 
-  /** One unchanged request, as it was sent. */
+  /** One signed request, exactly as the tool sent it. */
   String anySignedRequest() throws Exception {
     try (Relay relay = new Relay(tls, URI.create(service.url()))) {
       send(relay, operations().get(2), List.of());

@@ -173,7 +173,7 @@ final class SamlObjects {
     return value;
   }
 
-  /** An element of a namespace that SAML does not know. */
+  /** An element of a namespace that does not belong to SAML. */
   static XSAny foreign(String name, String text) {
     XSAny element = make(new QName("urn:partner.example", name, "p"), XSAny.TYPE_NAME);
     element.setTextContent(text);

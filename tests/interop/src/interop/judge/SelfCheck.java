@@ -4,12 +4,12 @@ package interop.judge;
 import java.security.cert.X509Certificate;
 import java.util.Map;
 
-/** Shows that the judges can disagree: gives them wrong expectations, each of which must be noticed. */
+/** Shows that the judges can disagree: each wrong expectation must be noticed. */
 final class SelfCheck {
   private SelfCheck() {
   }
 
-  /** @throws IllegalStateException when a wrong expectation is not noticed. Returns how many were. */
+  /** Returns how many wrong expectations were noticed. @throws IllegalStateException if one was not. */
   static int run(EnvelopeJudge judge, String signedRequest, Map<String, String> tokens, X509Certificate signing)
     throws Exception {
     Verdicts verdicts = new Verdicts();

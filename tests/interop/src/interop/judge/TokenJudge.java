@@ -24,7 +24,7 @@ final class TokenJudge {
   private TokenJudge() {
   }
 
-  /** The signature, by Santuario with its secure validation. The reference must be the assertion or the document. */
+  /** Judges the signature, with Santuario's secure validation. It must refer to the assertion or to the document. */
   static String bySantuario(String token, X509Certificate trusted) {
     try {
       Document document = Xml.parse(token);
@@ -41,7 +41,7 @@ final class TokenJudge {
     }
   }
 
-  /** The signature, by OpenSAML with its profile of signatures. */
+  /** Judges the signature, with OpenSAML's profile of signatures. */
   static String byOpenSaml(String token, X509Certificate trusted) {
     try {
       Element root = Xml.parse(token).getDocumentElement();
@@ -61,7 +61,7 @@ final class TokenJudge {
     }
   }
 
-  /** The form, by the schema that OpenSAML has. */
+  /** Judges the form, with the schema that OpenSAML has. */
   static String bySchema(String token) {
     try {
       new SAMLSchemaBuilder(SAMLSchemaBuilder.SAML1Version.SAML_11).getSAMLSchema().newValidator()

@@ -10,7 +10,7 @@ import java.util.Map;
 import java.util.regex.Matcher;
 import java.util.regex.Pattern;
 
-/** Judges tokens in both directions: Santuario and OpenSAML read ours, and the tool reads theirs. */
+/** Judges tokens in both directions: Santuario and OpenSAML read our tokens, and the tool reads tokens of other makers. */
 final class TokenJudgement {
   private static final String DIGESTS = "http://www.w3.org/2001/04/xmlenc#";
   private static final String MORE = "http://www.w3.org/2001/04/xmldsig-more#";

@@ -47,7 +47,7 @@ import org.opensaml.saml.saml2.core.SubjectConfirmationData;
 import org.opensaml.saml.saml2.core.SubjectLocality;
 import org.w3c.dom.Element;
 
-/** The kinds of token that an issuer may write, and those that must be refused by name. */
+/** The kinds of token that an issuer may write, and those that the tool must refuse with a stated reason. */
 final class TokenKinds {
   static final String ACCEPTED = "accepted";
 
@@ -96,7 +96,7 @@ final class TokenKinds {
     kinds.add(new Kind(name, assertion, NOTHING, null, null, text));
   }
 
-  /** For what OpenSAML has no objects: changes the tree before it is signed. */
+  /** Changes the tree before it is signed, because OpenSAML has no objects for that content. */
   private void refuseTree(String name, String text, Consumer<Element> change) {
     kinds.add(new Kind(name, SamlObjects.assertion(), change, null, null, text));
   }
@@ -105,7 +105,7 @@ final class TokenKinds {
     return root.getOwnerDocument().createElementNS(Xml.SAML, root.getPrefix() + ":" + name);
   }
 
-  /** With the declarations as attributes, so that the signature is of the same text as will be written. */
+  /** Adds the declarations as attributes. Otherwise the signed text would differ from the text that is written. */
   private static void setType(Element element, String type) {
     element.setAttributeNS(XMLNS, "xmlns:p", "urn:partner.example");
     element.setAttributeNS(XMLNS, "xmlns:xsi", XSI);
@@ -195,7 +195,7 @@ final class TokenKinds {
     return assertion;
   }
 
-  /** OpenSAML's support for key values does not know curves, but Santuario's does. */
+  /** Santuario writes key values of curves; OpenSAML does not. */
   private void addCurveKey(Element root) {
     Element keyInfo = Xml.find(Xml.child(root, Xml.SAML, "Subject"), Xml.DS, "KeyInfo");
     keyInfo.appendChild(new KeyValue(root.getOwnerDocument(), curveHolder.getPublicKey()).getElement());

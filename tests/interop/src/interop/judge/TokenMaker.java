@@ -43,7 +43,7 @@ final class TokenMaker {
     return Xml.write(root);
   }
 
-  /** Signs with Santuario, which knows algorithms that OpenSAML does not offer. */
+  /** Signs with Santuario, which has algorithms that OpenSAML does not offer. */
   static String signBySantuario(Assertion assertion, String signatureMethod, String digestMethod, Identity issuer)
     throws Exception {
     Element marshalled = XMLObjectProviderRegistrySupport.getMarshallerFactory().getMarshaller(assertion)
@@ -71,7 +71,7 @@ final class TokenMaker {
       Element signature = Xml.child(root, Xml.DS, "Signature");
       switch (name) {
         case "NameID" -> {
-          // Each one of the subject: a token whose confirmation has another name would be refused for that.
+          // Changes each name in the subject. If the names differed, the token could be refused for the difference.
           NodeList nameIds = Xml.child(root, Xml.SAML, "Subject").getElementsByTagNameNS(Xml.SAML, "NameID");
           for (int index = 0; index < nameIds.getLength(); ++index) {
             nameIds.item(index).setTextContent("x" + nameIds.item(index).getTextContent());
