@@ -125,6 +125,19 @@ TEST_F(ExplainSaml2, StatesEachReasonOfTheFirstConfirmationIfNoneCanBeUsed) {
   EXPECT_EQ(3u, report.claims.details.value().usedConfirmation);
 }
 
+TEST_F(ExplainSaml2, ReportsABearerConfirmationWithAKey) {
+  VerifyOptions options = Saml2Options();
+  options.requiredConfirmation = SamlToken::BEARER;
+  const TokenReport report = ExplainIn(
+      RichToken(Rich::EXPIRED_BEARER + Piece::Confirmation("holder-of-key", Piece::HolderOfKeyData()) + Rich::BEARER,
+                Piece::Confirmation("bearer", Piece::HolderOfKeyData())),
+      options);
+  const TokenReport::Finding finding = OnlyFinding(report, Check::CONFIRMATION);
+  EXPECT_EQ("The bearer confirmation has a key", finding.message);
+  EXPECT_EQ("Ask the service's operator to issue bearer confirmations without a key, or holder-of-key confirmations.",
+            finding.remedy);
+}
+
 TEST_F(ExplainSaml2, ReportsASessionThatHasEnded) {
   const TokenReport report = ExplainIn(
       RichToken("SessionNotOnOrAfter=\"2026-01-02T20:00:00Z\"", "SessionNotOnOrAfter=\"2026-01-02T02:50:00Z\""));
