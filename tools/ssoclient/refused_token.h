@@ -19,7 +19,8 @@ namespace SsoClient::Tool {
 /// uses its sink. Main thread only.
 class RefusedToken {
 public:
-  /// @param trusted the certificates, and `verifyOptions` the options, with which tokens are verified
+  /// @param trusted the certificates with which tokens are verified
+  /// @param verifyOptions the options with which tokens are verified
   RefusedToken(const TokenOutputOptions &options, const Tarvel::Crypto::CertificateList &trusted,
                const VerifyOptions &verifyOptions, const OutputOptions &output);
   RefusedToken(const RefusedToken &) = delete;
@@ -50,7 +51,7 @@ public:
   }
 
 private:
-  /// Saves the token, and returns what the caller can do next.
+  /// Saves the token, and returns a hint: where the token is, and what to do next.
   std::string Save(const std::string &xml);
 
   const TokenOutputOptions &m_options;
