@@ -15,8 +15,8 @@
 
 namespace SsoClient::Tool {
 
-/// Saves a refused token in the file of --save-refused, and adds a hint to the failure. Must outlive the service that
-/// uses its sink. Main thread only.
+/// Saves a refused token in the file of --save-refused, and adds a hint to the failure. The object must outlive the
+/// service that uses its sink. Main thread only.
 class RefusedToken {
 public:
   /// @param trusted the certificates with which tokens are verified
