@@ -126,8 +126,8 @@ PasswordCredentials ReadCredentials(const xmlNode &usernameToken) {
   return {TextOf(RequireChild(usernameToken, Ns::WSSE, "Username")), TextOf(password)};
 }
 
-/// The signed elements must be the body and the timestamp of this envelope, each once, and otherwise only its header
-/// elements of WS-Addressing.
+/// The signature must cover the body and the timestamp of this envelope, each once. It may also cover the header
+/// elements of WS-Addressing, each once, but nothing else.
 void RequireCoverage(const Envelope &envelope, const Identifiers &identifiers) {
   std::set<const xmlNode *> uncovered = {envelope.body, envelope.security.timestamp};
   std::set<const xmlNode *> optional(envelope.addressing.begin(), envelope.addressing.end());

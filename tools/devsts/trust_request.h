@@ -20,9 +20,10 @@ struct TrustRequest {
   RequestType type = RequestType::ISSUE;
   std::string tokenType; ///< one of the names of a SAML 2.0 assertion; empty for a validate request
   bool wantsHolderOfKey = false;
-  std::optional<std::string> useKey; ///< the identifier of the signature to whose key the token must be bound
-  std::optional<std::string>
-      useKeyCertificate; ///< the certificate to whose key it must be bound, as Base64 of its DER form
+  /// The identifier of a signature. The token must be bound to the key that made it.
+  std::optional<std::string> useKey;
+  /// A certificate, as Base64 of its DER form. The token must be bound to its key.
+  std::optional<std::string> useKeyCertificate;
   std::chrono::milliseconds lifetime{0};
   bool renewable = false;
   bool delegable = false;

@@ -103,7 +103,7 @@ Json AttributeJson(const SamlAttribute &attribute) {
           {"values", JsonArrayOf(attribute.values, ValueJson)}};
 }
 
-/// All keys are in this place, because callers rely on the keys and their order.
+/// All keys are in this one place, because callers rely on the keys and their order.
 Json DetailsJson(const TokenDetails &details) {
   return {{"nameId", ToJson(details.subject)},
           {"issuer", ToJson(details.issuer)},

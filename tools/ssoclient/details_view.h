@@ -20,7 +20,7 @@ void AddDetails(const boost::optional<TokenDetails> &details, nlohmann::ordered_
 /// Adds lines about the confirmation that is used, and about those that are not used.
 void AddConfirmationLines(const TokenDetails &details, LabelledLines &lines);
 
-/// Adds lines about what few tokens have: a session, restrictions of use, and attributes that have no line of their own.
+/// Adds lines about what only few tokens have: sessions, restrictions of use, and attributes without a line elsewhere.
 void AddDetailLines(const TokenDetails &details, const Tarvel::System::DateTime &now, LabelledLines &lines);
 
 } // namespace SsoClient::Tool

@@ -40,7 +40,7 @@ ExitCode ShowDialect(const std::string &nameOrFile, const OutputOptions &output)
 
 Action DefineDialect(CLI::App &app, const OutputOptions &output) {
   const auto nameOrFile = std::make_shared<std::string>();
-  AddOption(app, "DIALECT", *nameOrFile, "Write this dialect, a name or a file, as JSON; without it, list the names")
+  AddOption(app, "DIALECT", *nameOrFile, "Name or file of the dialect to write as JSON; without it, list the names")
       .TypeName("");
   return [nameOrFile, &output] { return ShowDialect(*nameOrFile, output); };
 }

@@ -36,7 +36,7 @@ public:
   using std::runtime_error::runtime_error;
 };
 
-/// The content of a regular file. Does not wait for the writer of a named pipe.
+/// The content of a regular file. A named pipe is refused without waiting for its writer.
 std::string ReadRegularFile(const std::string &path) {
   const int descriptor = open(path.c_str(), O_RDONLY | O_CLOEXEC | O_NOCTTY | O_NONBLOCK);
   if (descriptor < 0) {
@@ -67,8 +67,8 @@ std::string PlaceOf(const std::string &text, std::size_t byte) {
   return "line " + std::to_string(line) + ", column " + std::to_string(before.size() - lineBegin + 1);
 }
 
-/// The parser keeps the last value of a key that occurs twice, so that the reader of the file and the tool may see
-/// different dialects.
+/// Refuses a key that occurs twice: the parser would keep the last value, but a person who reads the file may see only
+/// the first.
 Json ParseWithUniqueKeys(const std::string &text) {
   std::vector<std::set<std::string>> keysOfOpenObjects;
   const auto refuseTwice = [&](int, Json::parse_event_t event, const Json &parsed) {
@@ -93,7 +93,7 @@ Json ParseWithUniqueKeys(const std::string &text) {
   }
 }
 
-/// The value, unless it is long or contains others.
+/// The value; of an array or an object only its type.
 std::string Show(const Json &value) {
   return value.is_structured() ? std::string("an ") + value.type_name() : value.dump(-1, ' ', true);
 }

@@ -23,7 +23,7 @@ constexpr std::string_view FILE_EXTENSION = ".json";
 struct Setting {
   const DialectSwitch *known;
   std::string value;
-  std::string option; ///< as the command line has it
+  std::string option; ///< as it is on the command line
 };
 
 Setting ReadSetting(const std::string &text) {
@@ -52,7 +52,7 @@ std::vector<Setting> ReadSettings(const DialectOptions &options) {
   return settings;
 }
 
-/// Two values for a switch are a mistake of the command line: neither is meant to replace the other.
+/// Two different values for one switch are a mistake: it is not known which of them is meant.
 void RefuseContradictions(const std::vector<Setting> &settings) {
   std::map<const DialectSwitch *, const Setting *> firsts;
   for (const Setting &setting : settings) {
@@ -76,13 +76,14 @@ bool Exists(const std::string &path) {
 
 void AddDialectOptions(CLI::App &app, DialectOptions &options) {
   AddOption(app, "--dialect", options.dialect,
-            "How the service wants to be asked: a name that `ssoclient dialect` lists, or a JSON file")
+            "How requests to the service are written: a name that `ssoclient dialect` lists, or a JSON file")
       .TypeName("NAME|FILE")
       .Group(GROUP);
   AddOption(app, "--dialect-switch", options.switches, "Change one switch of the dialect; may be repeated")
       .TypeName("NAME=VALUE")
       .Group(GROUP);
-  AddOption(app, "--applies-to", options.appliesTo, "Address of the service for which the token is (wsp:AppliesTo)")
+  AddOption(app, "--applies-to", options.appliesTo,
+            "Address of the service that will receive the token (wsp:AppliesTo)")
       .TypeName("URI")
       .Group(GROUP);
   AddFlag(app, "--addressing", options.addressing, "Send the headers of WS-Addressing 1.0").Group(GROUP);

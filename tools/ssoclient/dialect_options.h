@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// The options that say how the service wants to be asked.
+/// The options that choose and change the dialect of the service.
 
 #pragma once
 
@@ -19,15 +19,15 @@ namespace SsoClient::Tool {
 struct DialectOptions {
   std::string dialect;               ///< a name or a file; empty: the default dialect
   std::vector<std::string> switches; ///< each of the form NAME=VALUE
-  std::string appliesTo;             ///< empty: as the dialect says
-  bool addressing = false;           ///< false: as the dialect says
+  std::string appliesTo;             ///< empty: the dialect's value
+  bool addressing = false;           ///< false: the dialect's value
 };
 
 void AddDialectOptions(CLI::App &app, DialectOptions &options);
 
-/// The dialect of that name, or that is in the file. A name that the library knows is never read as a file.
-/// @throws UsageException for a text that is neither, and does not look like a path: the message lists the names.
-/// @throws Tarvel::IOException as `ReadDialectFile`.
+/// The dialect of that name, or the dialect in that file. The name of a dialect is never read as a file.
+/// @throws UsageException for a text that is neither, and does not look like a path. The message lists the names.
+/// @throws Tarvel::IOException like `ReadDialectFile`.
 ServiceDialect LoadDialect(const std::string &nameOrFile);
 
 /// The dialect, changed by the switches.

@@ -87,7 +87,7 @@ std::string GetTokenType(const ServiceDialect &dialect) {
   return dialect.tokenType.empty() ? std::string(SAML_2_TOKEN) : dialect.tokenType;
 }
 
-/// The name in a text of the form {NAMESPACE}NAME. The local name is empty when the form is another one.
+/// The name in a text of the form {NAMESPACE}NAME. The local name is empty if the text does not have this form.
 FaultName ReadFaultName(const std::string &text) {
   const std::size_t end = text.rfind('}');
   if (text.empty() || text.front() != '{' || end == std::string::npos) {

@@ -12,7 +12,7 @@
 
 namespace SsoClient::Tool {
 
-/// One switch. A command line writes every value as text.
+/// One switch. On the command line every value is a text.
 struct DialectSwitch {
   enum class JsonType {
     TEXT,
@@ -22,9 +22,9 @@ struct DialectSwitch {
 
   std::string_view name;
   JsonType jsonType;
-  /// The values, to be shown after "must be".
+  /// The possible values, as messages show them after "must be".
   std::string (*values)();
-  /// Returns false for a text that is not a value; the dialect is then unchanged.
+  /// Returns false for a text that is not a value. Do not use the dialect then.
   bool (*set)(ServiceDialect &dialect, const std::string &text);
   std::string (*get)(const ServiceDialect &dialect);
 };

@@ -60,7 +60,7 @@ constexpr Command COMMANDS[] = {
      "  ssoclient doctor --sts https://sts.corp.example/sts --ca ca.pem --trust sts.pem\n"
      "  ssoclient doctor --sts https://sts.corp.example/sts --ca ca.pem --timeout 5 --format json\n",
      DefineDoctor},
-    {"dialect", "List the dialects of services that are known, or write one as a file that can be edited",
+    {"dialect", "List the known dialects of services, or write one as JSON that can be edited",
      "  ssoclient dialect --format json\n"
      "  ssoclient dialect cxf >partner.json; ssoclient dialect partner.json\n",
      DefineDialect},

@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// The profile of tokens that a command accepts, and what the other profile would say.
+/// The profile of the tokens that a command accepts, and a hint about the other profile.
 
 #pragma once
 
@@ -21,8 +21,8 @@ void AddProfileOption(CLI::App &app, std::string &profile);
 /// The profile of that name: "strict" or "saml2".
 TokenProfile ProfileOf(const std::string &name) noexcept;
 
-/// Whether the profile SAML2 would accept a token that is refused with `options`, or why not. Empty if the options have
-/// that profile already, or if it refuses the token for the same reason.
+/// A hint for a token that is refused with `options`: that the profile SAML2 accepts it, or why SAML2 refuses it, too.
+/// Empty if `options` have the profile SAML2, or if both profiles refuse the token for the same reason.
 std::string OtherProfileHint(const std::string &xml, const Tarvel::Crypto::CertificateList &trusted,
                              const VerifyOptions &options);
 

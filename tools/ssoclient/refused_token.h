@@ -15,11 +15,12 @@
 
 namespace SsoClient::Tool {
 
-/// Saves a refused token in the file of --save-refused, and adds a hint to the failure. Must outlive the service that
-/// uses its sink. Main thread only.
+/// Saves a refused token in the file of --save-refused, and adds a hint to the failure. The object must outlive the
+/// service that uses its sink. Main thread only.
 class RefusedToken {
 public:
-  /// @param trusted the certificates, and `verifyOptions` the options, with which tokens are verified
+  /// @param trusted the certificates with which tokens are verified
+  /// @param verifyOptions the options with which tokens are verified
   RefusedToken(const TokenOutputOptions &options, const Tarvel::Crypto::CertificateList &trusted,
                const VerifyOptions &verifyOptions, const OutputOptions &output);
   RefusedToken(const RefusedToken &) = delete;
@@ -50,7 +51,7 @@ public:
   }
 
 private:
-  /// Saves the token, and returns what the caller can do next.
+  /// Saves the token, and returns a hint: where the token is, and what to do next.
   std::string Save(const std::string &xml);
 
   const TokenOutputOptions &m_options;

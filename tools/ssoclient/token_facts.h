@@ -28,7 +28,7 @@ struct CertificateFacts {
 };
 
 /// What a token says. An empty optional means that the token does not say it, or not in a form that can be read. For a
-/// verified token, no optional is empty, except the certificate of a bearer token.
+/// verified token, no optional is empty, except `certificate` if its confirmation has none.
 struct TokenFacts {
   boost::optional<std::string> id;
   boost::optional<PrincipalId> subject;

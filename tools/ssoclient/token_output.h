@@ -34,8 +34,8 @@ void CheckTokenOutput(const TokenOutputOptions &options, const OutputOptions &ou
 /// Warns of what `spec` asks for and the token does not have. With a file, writes the token's XML to it, and then,
 /// unless the format is XML, the report to standard output. If the file is "-", writes only the XML to standard output;
 /// without a file, only the report.
-/// @param dialect the service's
-/// @param toleranceSec as for `FindUnmet`
+/// @param dialect of the request
+/// @param toleranceSec see `FindUnmet`
 /// @throws Tarvel::IOException when the XML cannot be written, or, without a file, the report.
 void WriteToken(const IssuedToken &issued, const TokenSpec &spec, const ServiceDialect &dialect,
                 std::int64_t toleranceSec, const TokenOutputOptions &options, const OutputOptions &output);

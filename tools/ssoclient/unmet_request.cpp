@@ -24,8 +24,8 @@ std::string Join(const Texts &texts) {
   return joined;
 }
 
-/// Whether the principal's name is the whole identifier, which the profile SAML2 does not split. Its domain then says
-/// only which kind of identifier it is.
+/// Whether the principal's name is the whole identifier, which the profile SAML2 does not split. Its domain then states
+/// only the format and the qualifiers.
 bool HasWholeName(const PrincipalId &principal) {
   return principal.domain.find("nameid:") == 0;
 }
@@ -105,7 +105,7 @@ void CheckAdvice(const TokenSpec &spec, const TokenFacts &facts, std::vector<Unm
   }
 }
 
-/// A service may restrict a token to the address in `wsp:AppliesTo`, too, or take that address only as a hint.
+/// A service may restrict a token to the address in `wsp:AppliesTo`, too, or use that address only as a hint.
 void CheckAudience(const TokenSpec &spec, const ServiceDialect &dialect, const TokenFacts &facts,
                    std::vector<UnmetRequest> &unmet) {
   std::set<std::string> withAddress = spec.audienceRestriction;

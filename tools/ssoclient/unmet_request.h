@@ -23,7 +23,7 @@ struct UnmetRequest {
 };
 
 /// What `spec` asks for and `facts` do not have, in the order of the keys above. An empty fact counts as missing.
-/// @param dialect in which it was asked. `wst:OnBehalfOf` asks for a token about the other party, without a delegation.
+/// @param dialect of the request. `wst:OnBehalfOf` asks for a token about the other party, without a delegation.
 ///        `wst14:ActAs` is not checked: the standard does not say where a token names that party. The token may also be
 ///        restricted to the address in `wsp:AppliesTo`.
 /// @param askedAt when the request was sent, by this machine's clock

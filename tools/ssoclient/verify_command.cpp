@@ -31,7 +31,7 @@ struct VerifyArguments {
   std::string file;
 };
 
-/// Refuses an option that the profile strict would ignore: its tokens state nothing that could be compared.
+/// Refuses an option that the profile strict would ignore: tokens of that profile state nothing to compare with it.
 void RequireSaml2(const char *option, bool isGiven, const VerifyOptions &demands) {
   if (isGiven && demands.profile != TokenProfile::SAML2) {
     throw UsageException(std::string(option) + " needs --profile saml2; tokens of the profile strict do not state it");
