@@ -15,7 +15,8 @@
 
 namespace SsoClient {
 
-/// Signs the body of the envelope, then its timestamp and its header elements of WS-Addressing, if it has any. Appends the signature to `wsse:Security`.
+/// Signs the body of the envelope, then its timestamp and its header elements of WS-Addressing, if it has any. Appends the
+/// signature to `wsse:Security`.
 /// @param keyInfo builds the content of the signature's `ds:KeyInfo`; null for none
 /// @throws Tarvel::InvalidArgumentException when the envelope has no body, header or security element.
 /// @throws Tarvel::Xml::Security::XmlSecurityException when the key cannot sign.

@@ -11,8 +11,8 @@
 namespace SsoClient {
 
 /// Parses the body, turns a SOAP fault into an exception, and extracts the result of the operation. It has no state
-/// except the dialect and the listener, so any number of threads may use one handler without a listener. A call that throws does not
-/// change its out argument.
+/// except the dialect, which does not change, and the listener, so any number of threads may use one handler without a
+/// listener. A call that throws does not change its out argument.
 ///
 /// All functions throw
 /// - `InvalidCredentialsException` when the service refused the caller's credentials,
