@@ -49,8 +49,9 @@ struct SSOCLIENT_API ServiceDialect {
   boost::optional<std::string> appliesTo;
   /// Whether the header has the elements of WS-Addressing 1.0. They are signed when the message is signed.
   bool addressing = false;
-  Statement delegatable = Statement::ALWAYS;       ///< `wst:Delegatable`
-  Statement renewing = Statement::ALWAYS;          ///< `wst:Renewing`
+  Statement delegatable = Statement::ALWAYS; ///< `wst:Delegatable`
+  /// `wst:Renewing`. Without it, the service decides: it may issue a renewable token that nobody asked for.
+  Statement renewing = Statement::ALWAYS;
   UseKey useKey = UseKey::REFERENCE;               ///< `wst:UseKey`
   Delegation delegation = Delegation::DELEGATE_TO; ///< for `TokenSpec::delegateTo`
   /// The type of token in a request, and in the response that ends a negotiation; empty for

@@ -142,6 +142,8 @@ constexpr GeneralFault GENERAL_FAULTS[] = {
     {Namespaces::WSSE, "InvalidSecurity"},
     {Namespaces::WSS4J, "SecurityError"},
     {Namespaces::WST, "RequestFailed"},
+    {Namespaces::WST, "InvalidRequest"},
+    {Namespaces::WST, "BadRequest"},
 };
 
 void CheckCredentialFault(const FaultName &fault) {

@@ -146,6 +146,12 @@ def renew_rows(by_certificate):
         source = "password" if file == "key.xml" else "certificate"
         rows += [Row(f"renew (by {source})", "holder-of-key", endpoint, ["renew", file, *IDENTITY], {**facts, **HOLDER_OF_KEY},
                      "renewed.xml", by_certificate) for endpoint in ("/plain/x509", "/x509", "/sts")]
+    silent = "without `--renewable`, with `renewing=when-true`"  # the service then decides
+    rows += [Row(f"issue by certificate, {silent}", "holder-of-key", "/x509",
+                 ["acquire", *IDENTITY, "--dialect-switch", "renewing=when-true"], {**CERTIFICATE, **HOLDER_OF_KEY},
+                 "silent.xml", by_certificate),
+             Row(f"renew, of a token that was asked for {silent}", "holder-of-key", "/x509", ["renew", "silent.xml", *IDENTITY],
+                 {**CERTIFICATE, **HOLDER_OF_KEY}, "unused.xml", by_certificate)]
     rows.append(Row("renew, of a token that was asked for without `--renewable`", "holder-of-key", "/x509",
                     ["renew", "exchanged.xml", *IDENTITY], code=SERVICE_FAULT, fault="RequestFailed",
                     reason="the service does not permit it"))

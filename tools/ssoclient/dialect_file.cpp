@@ -7,6 +7,7 @@
 #include "output.h"
 
 #include <tarvel/core/exception.h>
+#include <tarvel/core/string_util.h>
 
 #include <nlohmann/json.hpp>
 
@@ -67,6 +68,12 @@ std::string PlaceOf(const std::string &text, std::size_t byte) {
   return "line " + std::to_string(line) + ", column " + std::to_string(before.size() - lineBegin + 1);
 }
 
+/// The value, shortened if it is long, unless it contains others.
+std::string Show(const Json &value) {
+  return value.is_structured() ? std::string("an ") + value.type_name()
+                               : Tarvel::StringUtil::Shorten(value.dump(-1, ' ', true));
+}
+
 /// Refuses a key that occurs twice: the parser would keep the last value, but a person who reads the file may see only
 /// the first.
 Json ParseWithUniqueKeys(const std::string &text) {
@@ -79,7 +86,7 @@ Json ParseWithUniqueKeys(const std::string &text) {
     } else if (event == Json::parse_event_t::key) {
       const auto &key = parsed.get_ref<const std::string &>();
       if (!keysOfOpenObjects.back().insert(key).second) {
-        throw DialectProblem("the key \"" + key + "\" occurs twice");
+        throw DialectProblem("the key " + Show(key) + " occurs twice");
       }
     }
     return true;
@@ -91,11 +98,6 @@ Json ParseWithUniqueKeys(const std::string &text) {
   } catch (const Json::out_of_range &) {
     throw DialectProblem("has a number that is out of range");
   }
-}
-
-/// The value; of an array or an object only its type.
-std::string Show(const Json &value) {
-  return value.is_structured() ? std::string("an ") + value.type_name() : value.dump(-1, ' ', true);
 }
 
 [[noreturn]] void RefuseValue(const std::string &key, const std::string &wanted, const Json &found) {
@@ -112,7 +114,7 @@ const std::string &RequireText(const std::string &key, const std::string &wanted
 constexpr const char *FAULT_FORM = "the texts \"namespace\" and \"name\"";
 
 [[noreturn]] void RefuseFaultKey(const std::string &key, const std::string &unknown) {
-  throw DialectProblem(key + ": unknown key \"" + unknown + "\"; the keys are namespace and name");
+  throw DialectProblem(key + ": unknown key " + Show(unknown) + "; the keys are namespace and name");
 }
 
 const std::string &ReadFaultText(const std::string &key, const Json &fault, const char *part) {
@@ -147,7 +149,7 @@ void ReadFaults(const std::string &key, const Json &value, ServiceDialect &diale
 void ReadSwitch(const std::string &key, const Json &value, ServiceDialect &dialect) {
   const DialectSwitch *const known = FindDialectSwitch(key);
   if (!known) {
-    throw DialectProblem("unknown key \"" + key + "\"; the keys are base, " + DialectSwitchNames());
+    throw DialectProblem("unknown key " + Show(key) + "; the keys are base, " + DialectSwitchNames());
   }
   if (known->jsonType == DialectSwitch::JsonType::FAULTS) {
     ReadFaults(key, value, dialect);

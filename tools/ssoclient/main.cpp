@@ -35,7 +35,7 @@ constexpr Command COMMANDS[] = {
      "  ssoclient acquire --sts https://sts.corp.example/sts --ca ca.pem --trust sts.pem \\\n"
      "      --cert client.pem --key client.key --token client.xml --delegate-to bob@corp.example --lifetime 15m\n"
      "  ssoclient acquire --sts https://sts.corp.example/sts --ca ca.pem --trust sts.pem \\\n"
-     "      --user alice@corp.example --password-file password.txt --dialect cxf\n"
+     "      --user alice@corp.example --password-file password.txt --dialect cxf --profile saml2\n"
      "  ssoclient acquire --sts https://sts.corp.example/sts --ca ca.pem --trust sts.pem --gss\n"
      "  ssoclient acquire --sts https://sts.corp.example/sts --ca ca.pem --trust sts.pem \\\n"
      "      --gss --service HTTP/sts.corp.example@CORP.EXAMPLE --client-keytab robot.keytab\n",

@@ -20,7 +20,7 @@ using testing::HasSubstr;
 using testing::Not;
 
 constexpr const char *NAMES = "default, cxf";
-constexpr const char *WST = "http://docs.oasis-open.org/ws-sx/ws-trust/200512";
+constexpr const char *WSSE = "http://docs.oasis-open.org/wss/2004/01/oasis-200401-wss-wssecurity-secext-1.0.xsd";
 
 #define SWITCHES                                                                                                       \
   "charset, applies-to, addressing, delegatable, renewing, use-key, delegation, token-type, token-type-reference, "    \
@@ -232,13 +232,13 @@ TEST_F(DialectService, ThatIgnoresWhatTheDialectAsksForCausesAWarning) {
 }
 
 TEST_F(DialectService, EndsWith3WhenItsFaultMeansRefusedCredentials) {
-  const std::string acquire = "ssoclient acquire " + Service("soap-fault-InvalidRequest") + PASSWORD;
+  const std::string acquire = "ssoclient acquire " + Service("soap-fault-wsse-FailedAuthentication") + PASSWORD;
   ExpectResult(Run(acquire), 8, "",
-               "ssoclient: service fault: Unexpected SOAP fault: wst:InvalidRequest; request failed.\n");
-  ExpectResult(Run(acquire + "--dialect-switch 'credential-faults={" + WST + "}InvalidRequest'"), 3, "",
+               "ssoclient: service fault: Unexpected SOAP fault: wsse:FailedAuthentication; request failed.\n");
+  ExpectResult(Run(acquire + "--dialect-switch 'credential-faults={" + WSSE + "}FailedAuthentication'"), 3, "",
                "ssoclient: credentials refused: Authentication failed: a fault was asked for\n");
-  ExpectResult(Run(acquire + "--dialect-switch 'credential-faults={urn:other}InvalidRequest'"), 8, "",
-               "ssoclient: service fault: Unexpected SOAP fault: wst:InvalidRequest; request failed.\n");
+  ExpectResult(Run(acquire + "--dialect-switch 'credential-faults={urn:other}FailedAuthentication'"), 8, "",
+               "ssoclient: service fault: Unexpected SOAP fault: wsse:FailedAuthentication; request failed.\n");
 }
 
 } // namespace

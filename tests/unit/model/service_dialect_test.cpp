@@ -178,10 +178,20 @@ TEST(CheckServiceDialect, RefusesACredentialFaultWhoseNameIsNotALocalName) {
 
 TEST(CheckServiceDialect, RefusesAFaultThatServicesAlsoReportForOtherReasons) {
   const std::vector<std::pair<std::string, std::string>> general = {
-      {SOAP11, "Client"},          {SOAP11, "Server"},         {SOAP11, "VersionMismatch"},
-      {SOAP11, "MustUnderstand"},  {SOAP12, "Sender"},         {SOAP12, "Receiver"},
-      {SOAP12, "VersionMismatch"}, {SOAP12, "MustUnderstand"}, {SOAP12, "DataEncodingUnknown"},
-      {WSSE, "InvalidSecurity"},   {WST, "RequestFailed"},     {"http://ws.apache.org/wss4j", "SecurityError"},
+      {SOAP11, "Client"},
+      {SOAP11, "Server"},
+      {SOAP11, "VersionMismatch"},
+      {SOAP11, "MustUnderstand"},
+      {SOAP12, "Sender"},
+      {SOAP12, "Receiver"},
+      {SOAP12, "VersionMismatch"},
+      {SOAP12, "MustUnderstand"},
+      {SOAP12, "DataEncodingUnknown"},
+      {WSSE, "InvalidSecurity"},
+      {WST, "RequestFailed"},
+      {WST, "InvalidRequest"},
+      {WST, "BadRequest"},
+      {"http://ws.apache.org/wss4j", "SecurityError"},
   };
   for (const auto &[namespaceUri, localName] : general) {
     std::string shown = "{\"";

@@ -8,6 +8,7 @@
 #include "support/work_folder.h"
 
 #include <tarvel/core/exception.h>
+#include <tarvel/core/string_util.h>
 
 #include <gtest/gtest.h>
 
@@ -172,6 +173,12 @@ const Refusal REFUSALS[] = {
      "credential-faults: name: must be a text, and is an array"},
     {"AddressThatIsNotAUri", R"({"applies-to": "mail"})",
      "Invalid argument : ServiceDialect::appliesTo is not an absolute URI: \"mail\""},
+    {"UnknownKeyWithControlCharacters", R"({"\u001b[31m\u0000red": 1})",
+     "unknown key \"\\u001b[31m\\u0000red\"; the keys are base, " KEYS},
+    {"LongText", R"({"charset": ")" + std::string(60000, 'k') + "\"}",
+     "charset: must be none or utf-8, and is " + Tarvel::StringUtil::Shorten('"' + std::string(60000, 'k') + '"')},
+    {"LongKey", R"({")" + std::string(60000, 'k') + "\": 1}",
+     "unknown key " + Tarvel::StringUtil::Shorten('"' + std::string(60000, 'k') + '"') + "; the keys are base, " KEYS},
     {"DeepNesting", R"({"charset": )" + std::string(30000, '[') + std::string(30000, ']') + "}",
      "charset: must be none or utf-8, and is an array"},
 };
