@@ -53,11 +53,13 @@ struct VerifyOptions {
   boost::optional<SamlToken::ConfirmationType> requiredConfirmation;
 
   /// The addresses of this program (`Recipient`), compared byte for byte. If the set is not empty, a bearer confirmation is
-  /// used only if it names one of them; if it is empty, a recipient is not checked. Only for the profile SAML2.
+  /// used only if it names one of them, and a holder-of-key confirmation only if it does not name another; if it is empty, a
+  /// recipient is not checked. Only for the profile SAML2.
   std::set<std::string> acceptedRecipients;
 
   /// The identifier of the request that the token must answer (`InResponseTo`). If set, a bearer confirmation is used
-  /// only if it states exactly this identifier; if not, what it states is not checked. Only for the profile SAML2.
+  /// only if it states exactly this identifier, and a holder-of-key confirmation only if it does not state another; if not
+  /// set, what it states is not checked. Only for the profile SAML2.
   boost::optional<std::string> expectedInResponseTo;
 
   /// The network address of the token's sender. If set, a confirmation that states another `Address` is not used; if
