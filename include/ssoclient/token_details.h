@@ -107,6 +107,8 @@ struct TokenDetails {
 /// @param token made by this library
 /// @throws Tarvel::InvalidArgumentException for an implementation of `SamlToken` that is not this library's.
 /// @throws ParseException when the attribute values that contain elements take more than 32 MiB in canonical form.
+/// @throws Tarvel::Xml::XMLParseException when the token was made from an element, and its canonical form is longer than a
+///         document may be.
 /// @throws Tarvel::OutOfMemoryException or std::bad_alloc when memory runs out.
 SSOCLIENT_API TokenDetails GetTokenDetails(const SamlToken &token);
 

@@ -115,7 +115,8 @@ SamlAttribute ReadAttribute(const ElementNode &element, ValueReader &reader) {
   return attribute;
 }
 
-/// Empties the values with a signature: it could belong to a bearer token, which a report must not repeat.
+/// Empties the values with a signature. It could be that of a bearer token, which a report must not repeat. The token may
+/// be there as elements, or as their text.
 void RemoveSignatures(std::vector<SamlAttribute> &attributes) {
   for (SamlAttribute &attribute : attributes) {
     for (AttributeValue &value : attribute.values) {

@@ -12,8 +12,8 @@
 namespace SsoClient {
 
 /// Reads the `ds:KeyInfo` at the cursor. The key is that of its first certificate or, if there is none, its first key
-/// value (`RSAKeyValue`, or `ECKeyValue` with a named curve). If there are both, their keys must be the same.
-/// Everything else in a `ds:KeyInfo` is ignored.
+/// value (`RSAKeyValue`, or `ECKeyValue` with a named curve). If there are both, their keys must be the same, unless the key
+/// value has a size or a curve that is not read. Everything else in a `ds:KeyInfo` is ignored.
 ///
 /// If there is no key, or a key value of a size or a curve with which no signature is accepted, `details.publicKey` stays
 /// empty. The key of a certificate may have any kind and size, as in the profile STRICT.

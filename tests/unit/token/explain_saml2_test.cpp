@@ -62,6 +62,16 @@ TEST_F(ExplainSaml2, AcceptsWhatTheProfileAccepts) {
   EXPECT_EQ("The confirmation is bearer; none is required.", Summary(report, Check::REQUIRED_CONFIRMATION));
 }
 
+TEST_F(ExplainSaml2, DoesNotRepeatTheSignatureOfATokenInAValue) {
+  const std::string value = "<s:SignatureValue xmlns:s=\"urn:s\">c2VjcmV0</s:SignatureValue>";
+  for (const std::string &written : {value, "<![CDATA[" + value + "]]>"}) {
+    const TokenReport report =
+        Explain(RichToken("<saml:AttributeValue>  <", "<saml:AttributeValue>" + written + "<"), Saml2Options());
+    EXPECT_TRUE(report.accepted) << report.refusal;
+    EXPECT_EQ("", report.claims.details.value().attributes.at(0).values.at(2).text) << written;
+  }
+}
+
 TEST_F(ExplainSaml2, StatesWhichConfirmationIsUsedAndWhyTheOthersAreNot) {
   EXPECT_EQ(
       "Confirmation 4 (bearer) of 4 is used; NotBefore 2026-01-02T00:00:00.000Z; NotOnOrAfter "

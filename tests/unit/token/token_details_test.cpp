@@ -11,6 +11,7 @@
 #include <ssoclient/token_verifier.h>
 #include <tarvel/core/environment.h>
 #include <tarvel/core/exception.h>
+#include <tarvel/xml/parser.h>
 
 #include <gtest/gtest.h>
 
@@ -199,6 +200,30 @@ TEST_F(TokenDetailsTest, AreTheSameForATokenInALargerDocument) {
   const auto token =
       TokenVerifier(TokenCertificates(), Saml2Options()).Verify(*document.Root().FindChildElement("Assertion"));
   EXPECT_EQ(DescribeDetails(RichDetails()), DescribeDetails(GetTokenDetails(*token)));
+}
+
+TEST_F(TokenDetailsTest, OfATokenInADocumentDoNotDependOnTheXmlAttributesAroundIt) {
+  const ParsedDocument document("<envelope xml:lang=\"en\" xml:space=\"preserve\">" + RichToken() + "</envelope>");
+  const auto token =
+      TokenVerifier(TokenCertificates(), Saml2Options()).Verify(*document.Root().FindChildElement("Assertion"));
+  EXPECT_EQ(DescribeDetails(RichDetails()), DescribeDetails(GetTokenDetails(*token)));
+}
+
+TEST_F(TokenDetailsTest, OfATokenInADocumentHaveTheNameThatWasVerified) {
+  const ParsedDocument document("<envelope>" + RichToken(">AbC &amp; d<", "> <!-- c -->AbC &amp; d<") + "</envelope>");
+  const auto token =
+      TokenVerifier(TokenCertificates(), Saml2Options()).Verify(*document.Root().FindChildElement("Assertion"));
+  EXPECT_EQ("AbC & d", GetNameId(*token).value);
+  EXPECT_EQ(GetNameId(*token), GetTokenDetails(*token).subject);
+}
+
+TEST_F(TokenDetailsTest, OfATokenInADocumentAreRefusedIfItsCanonicalFormIsTooLong) {
+  const ParsedDocument document("<envelope>" + RichToken(">x<w", ">" + std::string(4 * 1024 * 1024, '>') + "<w") +
+                                "</envelope>");
+  const auto token =
+      TokenVerifier(TokenCertificates(), Saml2Options()).Verify(*document.Root().FindChildElement("Assertion"));
+  EXPECT_THROW(GetTokenDetails(*token), Tarvel::Xml::XMLParseException); // the place depends on the certificate's lines
+  EXPECT_EQ("AbC & d", GetNameId(*token).value);
 }
 
 TEST_F(TokenDetailsTest, GetNameIdIsThatOfTheDetails) {
