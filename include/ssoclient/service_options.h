@@ -21,9 +21,6 @@ struct ServiceOptions {
   /// is secret.** What the function throws is written to the log and changes nothing else.
   using RefusedTokenSink = std::function<void(const std::string &tokenXml)>;
 
-  /// What the service expects in requests, and how its responses are read.
-  ServiceDialect dialect;
-
   /// How the tokens that the service returns are verified.
   VerifyOptions verifyOptions;
 
@@ -32,6 +29,9 @@ struct ServiceOptions {
 
   /// Called for each refused token; empty for none.
   RefusedTokenSink refusedTokenSink;
+
+  /// What the service expects in requests, and how its responses are read.
+  ServiceDialect dialect;
 };
 
 } // namespace SsoClient

@@ -105,15 +105,28 @@ void CheckAdvice(const TokenSpec &spec, const TokenFacts &facts, std::vector<Unm
   }
 }
 
-/// A service may restrict a token to the address in `wsp:AppliesTo`, too, or use that address only as a hint.
-void CheckAudience(const TokenSpec &spec, const ServiceDialect &dialect, const TokenFacts &facts,
-                   std::vector<UnmetRequest> &unmet) {
-  std::set<std::string> withAddress = spec.audienceRestriction;
+/// Whether the token is restricted to the requested audiences. A service may restrict a token to the address in
+/// `wsp:AppliesTo`, too, in the same restriction or in one of its own.
+bool HasAudience(const std::set<std::string> &requested, const ServiceDialect &dialect, const TokenFacts &facts) {
+  std::set<std::string> withAddress = requested;
+  std::set<std::string> address;
   if (dialect.appliesTo) {
     withAddress.insert(*dialect.appliesTo);
+    address.insert(*dialect.appliesTo);
   }
-  if (!spec.audienceRestriction.empty() && facts.audience != spec.audienceRestriction &&
-      facts.audience != withAddress) {
+  if (!facts.details || facts.details->audienceRestrictions.size() < 2) {
+    return facts.audience == requested || facts.audience == withAddress;
+  }
+  const std::vector<std::set<std::string>> &all = facts.details->audienceRestrictions;
+  return std::find(all.begin(), all.end(), requested) != all.end() &&
+         std::all_of(all.begin(), all.end(), [&](const std::set<std::string> &one) {
+           return one == requested || (dialect.appliesTo && one == address);
+         });
+}
+
+void CheckAudience(const TokenSpec &spec, const ServiceDialect &dialect, const TokenFacts &facts,
+                   std::vector<UnmetRequest> &unmet) {
+  if (!spec.audienceRestriction.empty() && !HasAudience(spec.audienceRestriction, dialect, facts)) {
     unmet.push_back({"audience", "restriction to the audience " + Join(spec.audienceRestriction) + "; the token is " +
                                      (facts.audience.empty() ? "not restricted" : "for " + Join(facts.audience))});
   }

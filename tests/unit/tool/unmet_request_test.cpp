@@ -190,6 +190,24 @@ TEST(FindUnmet, DoesNotCheckThePartyOfActAs) {
   EXPECT_THAT(WantedOf(spec, HourFrom(), dialect), IsEmpty());
 }
 
+TEST(FindUnmet, AcceptsARestrictionOfItsOwnForTheAddressThatTheTokenAppliesTo) {
+  ServiceDialect dialect;
+  dialect.appliesTo = "urn:c";
+  TokenSpec spec = SpecFor(3600);
+  spec.audienceRestriction = {"urn:a"};
+  TokenFacts facts = HourFrom();
+  facts.audience = {"(urn:c) and (urn:a)"};
+  facts.details.emplace();
+  facts.details->audienceRestrictions = {{"urn:c"}, {"urn:a"}};
+  EXPECT_THAT(WantedOf(spec, facts, dialect), IsEmpty());
+  const auto unmet = ElementsAre("restriction to the audience urn:a; the token is for (urn:c) and (urn:a)");
+  EXPECT_THAT(WantedOf(spec, facts), unmet);
+  facts.details->audienceRestrictions = {{"urn:c"}, {"urn:b"}};
+  EXPECT_THAT(WantedOf(spec, facts, dialect), unmet);
+  facts.details->audienceRestrictions = {{"urn:c"}, {"urn:c"}};
+  EXPECT_THAT(WantedOf(spec, facts, dialect), unmet);
+}
+
 TEST(FindUnmet, AcceptsARestrictionThatAlsoHasTheAddressThatTheTokenAppliesTo) {
   ServiceDialect dialect;
   dialect.appliesTo = "urn:c";
