@@ -3,6 +3,7 @@
 #include "token/saml2_details.h"
 
 #include "model/namespaces.h"
+#include "token/saml2_form.h"
 #include "xml/node_filter_iterator.h"
 
 #include <ssoclient/exceptions.h>
@@ -42,11 +43,6 @@ private:
   std::string m_text;
   std::size_t m_left = MAX_XML_VALUE_BYTES;
 };
-
-boost::optional<std::string> OptionalAttribute(const ElementNode &element, std::string_view name) {
-  const Attribute *const attribute = element.FindAttribute(std::string_view(), name);
-  return attribute ? boost::optional<std::string>(std::string(attribute->GetValue())) : boost::none;
-}
 
 bool HasElement(const ElementNode &value) {
   for (const Node *child = value.GetFirstChild(); child; child = child->GetNextSibling()) {
@@ -104,9 +100,9 @@ private:
 
 SamlAttribute ReadAttribute(const ElementNode &element, ValueReader &reader) {
   SamlAttribute attribute;
-  attribute.name = OptionalAttribute(element, "Name").value_or(std::string());
-  attribute.nameFormat = OptionalAttribute(element, "NameFormat");
-  attribute.friendlyName = OptionalAttribute(element, "FriendlyName");
+  attribute.name = ReadOptionalText(element, "Name").value_or(std::string());
+  attribute.nameFormat = ReadOptionalText(element, "NameFormat");
+  attribute.friendlyName = ReadOptionalText(element, "FriendlyName");
   for (const Node *child = element.GetFirstChild(); child; child = child->GetNextSibling()) {
     if (const ElementNode *const value = AsElement(child)) {
       attribute.values.push_back(reader.Read(*value));
@@ -130,8 +126,8 @@ void RemoveSignatures(std::vector<SamlAttribute> &attributes) {
 } // namespace
 
 NameId ReadNameId(const ElementNode &element) {
-  return {TextOf(element), OptionalAttribute(element, "Format"), OptionalAttribute(element, "NameQualifier"),
-          OptionalAttribute(element, "SPNameQualifier"), OptionalAttribute(element, "SPProvidedID")};
+  return {TextOf(element), ReadOptionalText(element, "Format"), ReadOptionalText(element, "NameQualifier"),
+          ReadOptionalText(element, "SPNameQualifier"), ReadOptionalText(element, "SPProvidedID")};
 }
 
 std::vector<SamlAttribute> ReadAttributes(const AttributeStatementType &statement) {

@@ -52,18 +52,6 @@ bool HasUnreadDate(const Saml2Assertion &assertion) {
   return false;
 }
 
-/// "a, b", and for several restrictions "(a, b) and (c)".
-std::string JoinRestrictions(const std::vector<std::set<std::string>> &restrictions) {
-  if (restrictions.size() == 1) {
-    return JoinTexts(restrictions.front());
-  }
-  std::string text;
-  for (const std::set<std::string> &audiences : restrictions) {
-    text += (text.empty() ? "(" : " and (") + JoinTexts(audiences) + ")";
-  }
-  return text;
-}
-
 } // namespace
 
 void Saml2Explainer::Parse(NodeFilterIterator iterator, DeviationSink &sink) {
@@ -179,7 +167,8 @@ void Saml2Explainer::ExplainAudience() {
   const std::vector<std::set<std::string>> &restrictions = saml2.details.audienceRestrictions;
   m_recorder.Begin(Check::AUDIENCE);
   CheckAudienceRestrictions(restrictions, m_options, saml2.common.Conditions.element, m_recorder);
-  m_recorder.Summarize(SummaryOfAudience(JoinRestrictions(restrictions)));
+  m_recorder.Summarize(
+      SummaryOfAudience(restrictions.size() == 1 ? JoinTexts(restrictions.front()) : JoinRestrictions(restrictions)));
 }
 
 /// The dates of a confirmation and of sessions can make the time of validity shorter than that of the conditions.

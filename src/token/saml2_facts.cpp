@@ -88,20 +88,6 @@ bool StatesFormat(const std::string &domain) {
   return upperCase.compare(0, NAME_ID.size(), Tarvel::StringUtil::ToUpper(std::string(NAME_ID))) == 0;
 }
 
-/// A text with blanks, so no address equals it: "(urn:a, urn:b) and (urn:c)".
-std::string JoinRestrictions(const std::vector<std::set<std::string>> &restrictions) {
-  std::string joined;
-  for (const std::set<std::string> &audiences : restrictions) {
-    if (!joined.empty()) {
-      joined += " and ";
-    }
-    joined += '(';
-    joined += JoinTexts(audiences);
-    joined += ')';
-  }
-  return joined;
-}
-
 } // namespace
 
 PrincipalId ToPrincipalId(const NameId &nameId) {
@@ -160,6 +146,19 @@ void TakeSaml2Conditions(const Saml2Assertion &assertion, TokenFacts &facts) {
       }
     }
   }
+}
+
+std::string JoinRestrictions(const std::vector<std::set<std::string>> &restrictions) {
+  std::string joined;
+  for (const std::set<std::string> &audiences : restrictions) {
+    if (!joined.empty()) {
+      joined += " and ";
+    }
+    joined += '(';
+    joined += JoinTexts(audiences);
+    joined += ')';
+  }
+  return joined;
 }
 
 std::set<std::string> TakeCommonAudiences(std::vector<std::set<std::string>> &&restrictions) {

@@ -49,4 +49,7 @@ void TakeSaml2Conditions(const Saml2Assertion &assertion, TokenFacts &facts);
 /// restrictions. There may be very many audiences, so they are moved, and there are fewer look-ups than audiences.
 std::set<std::string> TakeCommonAudiences(std::vector<std::set<std::string>> &&restrictions);
 
+/// A text with blanks, so no address equals it: "(urn:a, urn:b) and (urn:c)".
+std::string JoinRestrictions(const std::vector<std::set<std::string>> &restrictions);
+
 } // namespace SsoClient

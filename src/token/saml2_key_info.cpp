@@ -61,7 +61,12 @@ SubjectPublicKey ParseRsaKeyValue(const NodeFilterIterator &keyValue, DeviationS
   const bool hasModulus = ParseOctets(child, "Modulus", Namespaces::DS, modulus, sink);
   const bool hasExponent = ParseOctets(child, "Exponent", Namespaces::DS, exponent, sink);
   RefuseFurtherContent(child, sink);
-  return hasModulus && hasExponent ? Tarvel::Crypto::MakeRsaPublicKey(modulus, exponent) : SubjectPublicKey();
+  try {
+    return hasModulus && hasExponent ? Tarvel::Crypto::MakeRsaPublicKey(modulus, exponent) : SubjectPublicKey();
+  } catch (const Tarvel::Crypto::CryptoException &error) { // another version of OpenSSL may be stricter
+    Refuse(sink, keyValue, "an RSA public key", "", "RSAKeyValue does not decode: %1", error.what());
+  }
+  return {};
 }
 
 std::optional<NamedCurve> FindCurve(std::string_view uri) {
