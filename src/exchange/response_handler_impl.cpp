@@ -15,7 +15,7 @@ using Tarvel::Xml::ElementNode;
 
 /// The result of `extractor` for the body of a response that is not a fault. The name of the root element is ignored.
 template <typename Extractor>
-auto ResponseHandlerImpl::Process(Tarvel::Reader &response, const Extractor &extractor) const {
+auto ResponseHandlerImpl::ProcessResponseWith(Tarvel::Reader &response, const Extractor &extractor) const {
   const Tarvel::Ref<const ElementNode> envelope = ParseResponseDocument(response);
   CheckSoapFault(*envelope, m_listener, m_dialect);
   const ElementNode *const body = envelope->FindChildElement("Body");
@@ -27,19 +27,19 @@ auto ResponseHandlerImpl::Process(Tarvel::Reader &response, const Extractor &ext
 }
 
 void ResponseHandlerImpl::HandleAcquireTokenResponse(Tarvel::Reader *response, std::string &tokenXml) const {
-  tokenXml = Process(*response, ExtractIssuedToken);
+  tokenXml = ProcessResponseWith(*response, ExtractIssuedToken);
 }
 
 bool ResponseHandlerImpl::HandleValidateSubjectResponse(Tarvel::Reader *response) const {
-  return Process(*response, ExtractValidationStatus);
+  return ProcessResponseWith(*response, ExtractValidationStatus);
 }
 
 void ResponseHandlerImpl::HandleRenewTokenResponse(Tarvel::Reader *response, std::string &tokenXml) const {
-  tokenXml = Process(*response, ExtractRenewedToken);
+  tokenXml = ProcessResponseWith(*response, ExtractRenewedToken);
 }
 
 void ResponseHandlerImpl::HandleSPNegoResponse(Tarvel::Reader *response, SPNegoResponse &spnego) const {
-  SPNegoResponse leg = Process(*response, ExtractSPNegoLeg);
+  SPNegoResponse leg = ProcessResponseWith(*response, ExtractSPNegoLeg);
   spnego.contextId.swap(leg.contextId);
   spnego.leg.swap(leg.leg);
   spnego.tokenXml.swap(leg.tokenXml);

@@ -36,7 +36,7 @@ public:
 
 private:
   template <typename Extractor>
-  auto Process(Tarvel::Reader &response, const Extractor &extractor) const;
+  auto ProcessResponseWith(Tarvel::Reader &response, const Extractor &extractor) const;
 
   ServiceDialect m_dialect;
   FaultListener *m_listener;
