@@ -32,10 +32,12 @@ struct NameId {
   boost::optional<std::string> spNameQualifier; ///< `SPNameQualifier`: the service for which it is valid
   boost::optional<std::string> spProvidedId;    ///< `SPProvidedID`: the name that the same service uses
 
+  /// Whether both have the same octets in each field.
   friend bool operator==(const NameId &left, const NameId &right) {
     return left.value == right.value && left.format == right.format && left.nameQualifier == right.nameQualifier &&
            left.spNameQualifier == right.spNameQualifier && left.spProvidedId == right.spProvidedId;
   }
+  /// The opposite.
   friend bool operator!=(const NameId &left, const NameId &right) { return !(left == right); }
 };
 

@@ -21,7 +21,7 @@ final class Verdicts {
   void row(Object... cells) {
     StringBuilder line = new StringBuilder("|");
     for (Object cell : cells) {
-      line.append(' ').append(String.valueOf(cell).replace("|", "\\|").replace("\n", " ")).append(" |");
+      line.append(' ').append(String.valueOf(cell).replace("\\", "\\\\").replace("|", "\\|").replace("\n", " ")).append(" |");
     }
     lines.add(line.toString());
   }
