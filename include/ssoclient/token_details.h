@@ -58,13 +58,13 @@ struct SamlAttribute {
 
 /// A way in which the sender can prove that it may use the token (SAML 2.0 core, section 2.4.1.1).
 struct ConfirmationDetails {
-  std::string method;                                     ///< the URI of the method
-  boost::optional<NameId> nameId;                         ///< the party that must confirm, if it is not the subject
-  boost::optional<Tarvel::System::DateTime> notBefore;    ///< not usable before this instant
-  boost::optional<Tarvel::System::DateTime> notOnOrAfter; ///< no longer usable at this instant
-  boost::optional<std::string> recipient;                 ///< the address to which the token may be presented
-  boost::optional<std::string> inResponseTo;              ///< the identifier of the request that this answers
-  boost::optional<std::string> address;                   ///< the network address of the sender
+  std::string method;                                         ///< the URI of the method
+  boost::optional<NameId> nameId;                             ///< the party that must confirm, if it is not the subject
+  boost::optional<Tarvel::System::DateTime> notBefore;        ///< not usable before this instant
+  boost::optional<Tarvel::System::DateTime> notOnOrAfter;     ///< no longer usable at this instant
+  boost::optional<std::string> recipient;                     ///< the address to which the token may be presented
+  boost::optional<std::string> inResponseTo;                  ///< the identifier of the request that this answers
+  boost::optional<std::string> address;                       ///< the network address of the sender
   Tarvel::Ref<const Tarvel::Crypto::Certificate> certificate; ///< of a holder of key; null if none is stated
   /// The key of a holder of key: SubjectPublicKeyInfo in DER. Empty for other methods, and if no key is stated, or only
   /// a key value with which no signature is accepted: neither RSA with 2048 to 16384 bits and a sound exponent, nor on

@@ -21,7 +21,8 @@ final class Verdicts {
   void row(Object... cells) {
     StringBuilder line = new StringBuilder("|");
     for (Object cell : cells) {
-      line.append(' ').append(String.valueOf(cell).replace("\\", "\\\\").replace("|", "\\|").replace("\n", " ")).append(" |");
+      String text = String.valueOf(cell).replace("\\", "\\\\").replace("|", "\\|").replace("\n", " ");
+      line.append(' ').append(text).append(" |");
     }
     lines.add(line.toString());
   }
