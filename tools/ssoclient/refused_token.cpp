@@ -30,7 +30,7 @@ std::string RefusedToken::Save(const std::string &xml) {
   try {
     WriteFileWhole(file, xml + "\n", m_options.replace);
   } catch (const Tarvel::IOException &failure) {
-    const std::string warning = std::string("the refused token could not be saved: ") + failure.what();
+    std::string warning = std::string("the refused token could not be saved: ") + failure.what();
     Warn(warning, m_output);
     return warning;
   }
