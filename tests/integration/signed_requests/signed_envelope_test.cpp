@@ -160,11 +160,11 @@ TEST_P(SignedEnvelope, FailsAfterAnyChangeToAnythingThatIsSigned) {
   const std::string certificate = NamedCertificate(ForeignDocument(m_request.body));
   std::size_t tried = 0;
   std::vector<std::string> parts = {"Body", "Timestamp"};
-  for (const xmlNodePtr element : Addressing(ForeignDocument(m_request.body))) {
+  const ForeignDocument original(m_request.body);
+  for (const xmlNodePtr element : Addressing(original)) {
     parts.emplace_back(reinterpret_cast<const char *>(element->name));
   }
   for (const std::string &part : parts) {
-    const ForeignDocument original(m_request.body);
     const std::size_t count = Elements(Find(original.Root(), part)).size();
     for (std::size_t i = 0; i < count; ++i) {
       for (const Change &change : CHANGES) {
