@@ -7,6 +7,7 @@
 #include "verifiers.h"
 
 #include "support/fixed_environment.h"
+#include "support/sanitized.h"
 #include "xml/xml_text.h"
 
 #include <tarvel/xml/document.h>
@@ -14,7 +15,9 @@
 
 #include <gtest/gtest.h>
 
+#include <cstddef>
 #include <string>
+#include <vector>
 
 namespace Reports {
 namespace {
@@ -24,13 +27,19 @@ using Testing::JudgeElement;
 using Testing::Judgement;
 using Testing::JudgeText;
 
+/// With sanitizers, all verifiers would take ten minutes. So each file is given to every fifth one, and the next file to the
+/// ones that follow these.
+constexpr std::size_t STEP = Testing::IS_SANITIZED ? 5 : 1;
+
 class ReportsOnFiles : public testing::Test {
 protected:
   /// Expects that each verifier's report on each file is right, and counts the outcomes.
   void ExpectRightReports(const std::string &folder, OutcomeCount &count) {
+    const std::vector<JudgedVerifier> &verifiers = AllVerifiers();
+    std::size_t first = 0;
     for (const TokenFile &file : ReadTokenFiles(folder)) {
-      for (const JudgedVerifier &verifier : AllVerifiers()) {
-        const Judgement judgement = JudgeText(verifier, file.xml);
+      for (std::size_t i = first++ % STEP; i < verifiers.size(); i += STEP) {
+        const Judgement judgement = JudgeText(verifiers[i], file.xml);
         ASSERT_EQ("", judgement.contradictions) << file.name;
         count.Add(judgement);
       }
@@ -44,7 +53,7 @@ private:
 TEST_F(ReportsOnFiles, AreRightForTokens) {
   OutcomeCount count;
   ExpectRightReports("tokens", count);
-  EXPECT_GT(count.GetAccepted(), 200u);
+  EXPECT_GT(count.GetAccepted(), 200u / STEP);
   for (const char *const check : {"validity", "keys", "signature", "audience", "required-confirmation"}) {
     EXPECT_GT(count.GetFirstFailed().count(check), 0u) << check;
   }
@@ -62,7 +71,7 @@ TEST_F(ReportsOnFiles, AreRightForAttacks) {
 TEST_F(ReportsOnFiles, AreRightForTokensOfOtherTools) {
   OutcomeCount count;
   ExpectRightReports("saml2", count);
-  EXPECT_GT(count.GetAccepted(), 200u);
+  EXPECT_GT(count.GetAccepted(), 200u / STEP);
   EXPECT_GT(count.GetDifferentRefusals(), 45u);
   for (const char *const check : {"form", "validity", "confirmation", "delegation", "names", "audience"}) {
     EXPECT_GT(count.GetFirstFailed().count(check), 0u) << check;
