@@ -9,7 +9,7 @@
 
 #pragma once
 
-#include <mutex>
+#include <tarvel/core/fork_safe_mutex.h>
 
 namespace Tarvel {
 
@@ -36,22 +36,6 @@ public:
 private:
   const unsigned m_suspended; // how many computations the thread had begun
 };
-
-/// A mutex whose holder counts as computing, so that no child finds it locked. `std::condition_variable_any` releases
-/// it while it waits.
-class ForkSafeMutex {
-public:
-  void lock();
-  void unlock() noexcept;
-
-private:
-  std::mutex m_mutex;
-};
-
-/// The number of forks between the process that first used the platform and this one. An object that was made at
-/// another number belongs to a parent: its threads do not exist here, and what it shares with the parent must not be
-/// touched.
-unsigned GetForkGeneration() noexcept;
 
 /// Acts when the process forks.
 class ForkListener {

@@ -109,6 +109,7 @@ void HttpExchange::OnConnected(const Ref<System::Stream> &stream, const Exceptio
     }
     m_connecting.reset();
     m_stream = stream;
+    m_hasConnected = stream && !failure;
     isCancelled = m_isCancelled;
   }
   if (isCancelled) {
@@ -330,6 +331,11 @@ void HttpExchange::Cancel() noexcept {
   if (stream) {
     stream->Close();
   }
+}
+
+bool HttpExchange::HasConnected() const noexcept {
+  const std::lock_guard<ForkSafeMutex> lock(m_mutex);
+  return m_hasConnected;
 }
 
 bool HttpExchange::IsDone() const noexcept {

@@ -42,6 +42,7 @@ public:
   /// Does nothing in a child of the process that started the request: there the request counts as done.
   void Cancel() noexcept override;
   bool IsDone() const noexcept override;
+  bool HasConnected() const noexcept override;
 
 private:
   static constexpr std::size_t BUFFER_BYTES = 16 * 1024; // the content of one TLS record
@@ -91,6 +92,7 @@ private:
   Ref<System::Stream> m_stream;
   UserAgent::CompletionFunction m_completion;
   bool m_isConnectOver = false;
+  bool m_hasConnected = false;
   bool m_isCancelled = false;
   bool m_isWriteOver = false;
   bool m_endWaitsForWrite = false;

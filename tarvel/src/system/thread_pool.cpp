@@ -306,6 +306,12 @@ Ref<ThreadPool> GetThreadPool() {
   return Ref<ThreadPool>(pool);
 }
 
+Ref<ThreadPool> GetComputePool() {
+  const Computation computing;
+  static ThreadPool *const pool = CreateEndlessThreadPool(COMPUTE_THREAD_CEILING, DEFAULT_IDLE_TIME).Detach();
+  return Ref<ThreadPool>(pool);
+}
+
 Ref<ThreadPool> CreateThreadPool(std::size_t threadCeiling, std::chrono::milliseconds idleTime) {
   return MakeRef<ThreadPoolImpl>(threadCeiling, idleTime, false);
 }

@@ -68,6 +68,11 @@ protected:
 
 /// A request that has been started.
 class TARVEL_API PendingRequestItem : public System::ScheduledItem {
+public:
+  /// Whether a connection was made, so that the server may have received a part of the request. Final once the completion function
+  /// has been called.
+  virtual bool HasConnected() const noexcept = 0;
+
 protected:
   ~PendingRequestItem() override;
 };

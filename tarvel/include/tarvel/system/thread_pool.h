@@ -48,6 +48,13 @@ constexpr std::size_t DEFAULT_THREAD_CEILING = 256;
 /// The process's pool, made on first use (no thread before the first item); it lives until the process ends.
 TARVEL_API Ref<ThreadPool> GetThreadPool();
 
+/// How many threads the pool for computations has at most.
+constexpr std::size_t COMPUTE_THREAD_CEILING = 4;
+
+/// The process's pool for short computations, such as composing and verifying messages: its items must not block, nor wait
+/// for anything. Made on first use; it lives until the process ends.
+TARVEL_API Ref<ThreadPool> GetComputePool();
+
 /// A separate pool; its ceiling is at least one thread. Releasing the last reference ends the pool: it drops the work
 /// in the queue and waits for running work. If work of the pool itself releases the last reference, running work is not
 /// waited for, and ends by itself.

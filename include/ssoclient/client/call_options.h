@@ -1,0 +1,67 @@
+// SPDX-License-Identifier: Apache-2.0
+/// @file
+/// `CallOptions` and `RetryPolicy`: how long one operation may take, what cancels it, and whether it is tried again.
+
+#pragma once
+
+#include <ssoclient/client/cancellation.h>
+#include <ssoclient/client/executor.h>
+#include <ssoclient/operation_observer.h>
+#include <ssoclient/service_dialect.h>
+#include <ssoclient/verify_options.h>
+
+#include <boost/optional.hpp>
+
+#include <chrono>
+#include <memory>
+
+namespace SsoClient {
+
+/// When an operation is tried again. The default never does.
+///
+/// Only a request that the service cannot have acted upon is repeated: one for which no connection was made, and one that was
+/// answered with the status 503 and a header `Retry-After`, for which the policy waits as long as the service demands. An
+/// operation is not tried again when its deadline would pass during the wait. It then ends at once with the failure of the
+/// last attempt.
+struct RetryPolicy {
+  int attempts = 1;                               ///< at most so many, the first included; at least 1
+  std::chrono::milliseconds firstDelay{200};      ///< before the second attempt; it doubles for each further one
+  std::chrono::milliseconds longestDelay{10'000}; ///< no delay is longer; a longer `Retry-After` ends the operation
+};
+
+/// Options of one call. Those that are not set are the client's.
+struct CallOptions {
+  /// The clock of deadlines, which no change of the system's time affects.
+  using Clock = std::chrono::steady_clock;
+
+  /// When the operation ends with `DeadlineExceededException` if it has not ended before. Without a deadline, only the time
+  /// for each message is limited, to four minutes.
+  boost::optional<Clock::time_point> deadline;
+
+  /// What cancels the operation, which then ends with `CancelledException`.
+  CancelToken cancelToken;
+
+  /// Follows this operation in place of the client's observer; null for the client's.
+  std::shared_ptr<OperationObserver> observer;
+
+  /// The dialect in place of the client's.
+  boost::optional<ServiceDialect> dialect;
+
+  /// How the returned token is verified, in place of the client's options.
+  boost::optional<VerifyOptions> verifyOptions;
+
+  /// Where the callback runs, in place of the client's executor; empty for the client's. A call that waits does not use it.
+  Executor executor;
+
+  /// The policy in place of the client's.
+  boost::optional<RetryPolicy> retryPolicy;
+
+  /// Options with a deadline `timeout` from now. A negative time is a deadline that has passed.
+  static CallOptions WithTimeout(std::chrono::milliseconds timeout) {
+    CallOptions options;
+    options.deadline = Clock::now() + timeout;
+    return options;
+  }
+};
+
+} // namespace SsoClient

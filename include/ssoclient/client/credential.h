@@ -1,0 +1,42 @@
+// SPDX-License-Identifier: Apache-2.0
+/// @file
+/// Credentials as values: password, certificate, token, negotiation.
+
+#pragma once
+
+#include <ssoclient/negotiation_handler.h>
+#include <ssoclient/saml_token.h>
+#include <tarvel/core/secret_text.h>
+
+#include <functional>
+#include <memory>
+#include <string>
+#include <variant>
+
+namespace SsoClient {
+
+/// A user's name and password.
+struct PasswordCredential {
+  std::string username;        ///< as the service knows it, for example "alice@corp.example"
+  Tarvel::SecretText password; ///< overwritten when the last copy is destroyed
+};
+
+/// The holder-of-key identity of the client's configuration.
+struct CertificateCredential {};
+
+/// A token, which is exchanged for another one. The request is signed with the client's holder-of-key identity.
+struct TokenCredential {
+  std::shared_ptr<const SamlToken> token; ///< not null
+};
+
+/// A GSS (SPNEGO) negotiation.
+struct NegotiationCredential {
+  /// Makes the handler of one negotiation; called once for each attempt, on the threads of the platform's pool, where it may
+  /// block. So are all functions of the handler. What it throws ends the operation.
+  std::function<std::shared_ptr<NegotiationHandler>()> makeHandler;
+};
+
+/// Any of them.
+using Credential = std::variant<PasswordCredential, CertificateCredential, TokenCredential, NegotiationCredential>;
+
+} // namespace SsoClient

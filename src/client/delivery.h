@@ -1,0 +1,18 @@
+// SPDX-License-Identifier: Apache-2.0
+/// @file
+/// `RunOn`, which runs a callback on an executor, exactly once.
+
+#pragma once
+
+#include <ssoclient/client/executor.h>
+
+#include <functional>
+
+namespace SsoClient {
+
+/// Runs `function` once on `executor`; if that is empty, throws, or destroys the function without running it, on a compute
+/// thread of the platform, and if none can be started, in this call. What `function` or `executor` throws is logged. In a
+/// child of the process that called this, the function is not run.
+void RunOn(const Executor &executor, std::function<void()> function) noexcept;
+
+} // namespace SsoClient

@@ -1,0 +1,58 @@
+// SPDX-License-Identifier: Apache-2.0
+/// @file
+/// `TokenCacheFile`, a file in which programs of one user share a token.
+
+#pragma once
+
+#include <ssoclient/client/token_source.h>
+#include <ssoclient/saml_token.h>
+#include <ssoclient/token_spec.h>
+
+#include <functional>
+#include <memory>
+#include <string>
+
+namespace SsoClient {
+
+/// What a cached token belongs to. A token of another binding is not returned.
+struct CacheBinding {
+  std::string serviceUrl;
+  std::string owner; ///< user name, principal, or "certificate:" and the SHA-256 thumbprint; never a secret
+  TokenSpec spec;
+  std::string options; ///< what else decides about the token, for example the names of dialect and profile
+};
+
+/// Safe on any thread. Its functions block: they read, write and wait for locks of other programs.
+class TokenCacheFile {
+public:
+  using Verify = std::function<std::shared_ptr<const SamlToken>(const std::string &xml)>;
+
+  /// @param verify makes a token of its XML, or throws
+  TokenCacheFile(std::string path, CacheBinding binding, Verify verify);
+
+  /// The exclusive lock of the file, held until it is destroyed or the process ends.
+  class Lock;
+
+  /// Tries to take the lock; null when another program has it.
+  /// @throws Tarvel::IOException when the file is refused or cannot be made
+  std::unique_ptr<Lock> TryLock() const;
+
+  /// The token of this binding, verified again; null when there is none: no file, an empty, truncated or foreign one, another
+  /// binding, a token that is refused now. Needs no lock.
+  /// @throws Tarvel::IOException when the file is refused (a link, another owner, a mode that lets others in) or cannot be read
+  std::shared_ptr<const SamlToken> Read() const;
+
+  /// Replaces the content as a whole; readers see the old or the new content.
+  /// @throws Tarvel::IOException when it cannot be written, for example on a full disk; the old content then stays, and no other file is left.
+  void Write(const Lock &lock, const SamlToken &token) const;
+
+  /// Removes the token from the file, if it is the one with this identifier.
+  void Remove(const Lock &lock, const std::string &tokenId) const;
+
+private:
+  std::string m_path;
+  CacheBinding m_binding;
+  Verify m_verify;
+};
+
+} // namespace SsoClient
