@@ -101,7 +101,7 @@ public:
     }
     const std::string answer = m_state->answer(request);
     if (request.facts) {
-      *request.facts = {200, "OK", "text/xml", answer.size()};
+      *request.facts = {200, "OK", "text/xml", answer.size(), "", true};
     }
     response = Tarvel::CreateStringReader(answer);
   }
