@@ -131,7 +131,7 @@ private:
   int m_leg = 0;
   SecretMask m_mask;
   std::atomic<Use> m_use{Use::NONE};
-  std::exception_ptr m_failure;  // with which the operation ended
+  std::exception_ptr m_failure; // with which the operation ended
   EventsEndListener *m_endListener = nullptr;
 };
 

@@ -11,14 +11,12 @@ using Tarvel::Service::LogInternal;
 
 OperationFrame::OperationFrame(const std::string &operationName, const char *className)
     : m_opId(Tarvel::StringUtil::GenerateUuid()), m_operationName(operationName), m_className(className) {
-  LogInternal(getLogger(), LOG_LEVEL_OPERATION, "opId=%1 START operation %2::%3", m_opId, m_className,
-              m_operationName);
+  LogInternal(getLogger(), LOG_LEVEL_OPERATION, "opId=%1 START operation %2::%3", m_opId, m_className, m_operationName);
 }
 
 OperationFrame::~OperationFrame() {
   try {
-    LogInternal(getLogger(), LOG_LEVEL_OPERATION, "opId=%1 END operation %2::%3", m_opId,
-                m_className, m_operationName);
+    LogInternal(getLogger(), LOG_LEVEL_OPERATION, "opId=%1 END operation %2::%3", m_opId, m_className, m_operationName);
   } catch (...) {
     // Out of memory: the line is lost, but the outcome of the operation is not.
   }

@@ -93,9 +93,8 @@ std::shared_ptr<const SamlToken> TokenSteps::ReadRenewed(Tarvel::Reader &respons
 
 bool TokenSteps::ReadValidity(Tarvel::Reader &response, OperationEvents &events) const {
   bool isValid = false;
-  events.Receive(*m_responseHandler, [&](const ResponseHandler &handler) {
-    isValid = handler.HandleValidateSubjectResponse(&response);
-  });
+  events.Receive(*m_responseHandler,
+                 [&](const ResponseHandler &handler) { isValid = handler.HandleValidateSubjectResponse(&response); });
   LogWith("Result: %1", isValid);
   return isValid;
 }

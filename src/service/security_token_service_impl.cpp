@@ -132,8 +132,7 @@ void SecurityTokenServiceImpl::Negotiate(const TokenSpec &spec, NegotiationHandl
                                          OperationEvents &events) const {
   const std::shared_ptr<TransportSession> session = m_transport->CreateSession();
   for (int number = 1; spnego.tokenXml.empty(); ++number) {
-    const std::shared_ptr<std::vector<std::uint8_t>> leg =
-        TokenSteps::AskForLeg(handler, spnego.leg, number, events);
+    const std::shared_ptr<std::vector<std::uint8_t>> leg = TokenSteps::AskForLeg(handler, spnego.leg, number, events);
     if (spnego.contextId.empty()) {
       StartSPNegotiation(*session, *leg, spec, spnego, events);
     } else {
