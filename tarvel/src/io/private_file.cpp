@@ -2,8 +2,9 @@
 
 #include <tarvel/io/private_file.h>
 
+#include "core/fork_gate.h"
+
 #include <tarvel/core/exception.h>
-#include <tarvel/core/fork_safe_mutex.h>
 #include <tarvel/core/string_util.h>
 
 #include <algorithm>
@@ -257,7 +258,10 @@ void SynchroniseFolderOf(const std::string &path) {
 } // namespace
 
 PrivateFileLock::PrivateFileLock(std::string path, int descriptor) noexcept
-    : m_path(std::move(path)), m_descriptor(descriptor), m_generation(GetForkGeneration()) {}
+    : m_path(std::move(path)), m_descriptor(descriptor), m_generation(0) {
+  const Computation computing; // from now on, forks are counted
+  m_generation = GetForkGeneration();
+}
 
 PrivateFileLock::~PrivateFileLock() {
   Release();
