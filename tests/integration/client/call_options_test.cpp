@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 // The options of one call replace those of the client, and only for that call.
-#include "integration/client/operation_forms.h"
+#include "support/operation_forms.h"
 #include "integration/service/service_client.h"
 #include "support/data_file.h"
 #include "support/posting_server.h"

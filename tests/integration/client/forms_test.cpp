@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 // Each kind of credential in each form against the development service, over TLS: all facts of the token are compared.
-#include "integration/client/operation_forms.h"
+#include "support/operation_forms.h"
 #include "integration/service/service_client.h"
 #include "support/rendezvous.h"
 #include "support/throws_message.h"

@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 // Negotiations of many legs, with a scripted service.
-#include "integration/client/operation_forms.h"
+#include "support/operation_forms.h"
 #include "support/data_file.h"
 #include "support/posting_server.h"
 #include "support/process_resources.h"

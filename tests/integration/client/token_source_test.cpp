@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 // A token source over a client, against the development service over TLS.
-#include "integration/client/operation_forms.h"
+#include "support/operation_forms.h"
 #include "integration/service/service_client.h"
 #include "support/process_resources.h"
 #include "support/rendezvous.h"

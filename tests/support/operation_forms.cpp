@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 
-#include "integration/client/operation_forms.h"
+#include "support/operation_forms.h"
 
 #include <exception>
 #include <functional>
