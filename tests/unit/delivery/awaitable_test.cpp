@@ -244,7 +244,7 @@ TEST(Awaitable, CancelsTheOperationOfAnInnerCoroutine) {
 }
 
 /// Waits for operations that end on another thread, sometimes before the start has returned.
-EagerTask WaitForOtherThread(int count, const std::function<void(std::function<void()>)> &execute, int &successes,
+EagerTask WaitForOtherThread(int count, std::function<void(std::function<void()>)> execute, int &successes,
                              EventCount &done) {
   for (int i = 0; i < count; ++i) {
     const bool isValid = co_await Awaitable<bool>([&](const CancelToken &, const Awaitable<bool>::Callback &callback) {
