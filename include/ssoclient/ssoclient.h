@@ -6,6 +6,15 @@
 
 #include <ssoclient/advice.h>
 #include <ssoclient/as_future.h>
+#include <ssoclient/client/awaitable.h>
+#include <ssoclient/client/call_options.h>
+#include <ssoclient/client/cancellation.h>
+#include <ssoclient/client/credential.h>
+#include <ssoclient/client/exceptions.h>
+#include <ssoclient/client/executor.h>
+#include <ssoclient/client/outcome.h>
+#include <ssoclient/client/token_client.h>
+#include <ssoclient/client/token_source.h>
 #include <ssoclient/connection_spec.h>
 #include <ssoclient/create_saml_token.h>
 #include <ssoclient/delegate.h>

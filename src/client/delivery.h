@@ -12,7 +12,9 @@ namespace SsoClient {
 
 /// Runs `function` once on `executor`; if that is empty, throws, or destroys the function without running it, on a compute
 /// thread of the platform, and if none can be started, in this call. What `function` or `executor` throws is logged. In a
-/// child of the process that called this, the function is not run.
+/// child of the process that called this, the function is not run. Called without a lock, because an executor may run the
+/// function at once.
+/// @param function not empty; released on the thread that has run it
 void RunOn(const Executor &executor, std::function<void()> function) noexcept;
 
 } // namespace SsoClient

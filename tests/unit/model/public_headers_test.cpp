@@ -16,9 +16,10 @@ namespace {
 TEST(UmbrellaHeader, IncludesAllOtherPublicHeadersOfTheClient) {
   const std::string folder = "../../include/ssoclient";
   std::set<std::string> expected;
-  for (const auto &entry : std::filesystem::directory_iterator(Testing::DataPath(folder))) {
-    if (entry.path().extension() == ".h" && entry.path().filename() != "ssoclient.h") {
-      expected.insert("#include <ssoclient/" + entry.path().filename().string() + ">");
+  const std::filesystem::path root = Testing::DataPath(folder);
+  for (const auto &entry : std::filesystem::recursive_directory_iterator(root)) {
+    if (entry.path().extension() == ".h" && entry.path() != root / "ssoclient.h") {
+      expected.insert("#include <ssoclient/" + entry.path().lexically_relative(root).string() + ">");
     }
   }
   EXPECT_GT(expected.size(), 10u);
