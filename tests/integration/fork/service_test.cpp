@@ -2,13 +2,9 @@
 // A service of the parent process, used by its child while the parent's operations are under way.
 
 #include "integration/fork/held_service.h"
-#include "integration/fork/server_process.h"
 #include "support/data_file.h"
 #include "support/forked.h"
-#include "support/posting_server.h"
-#include "support/process_resources.h"
 #include "support/rendezvous.h"
-#include "support/soap_responses.h"
 #include "support/throws_message.h"
 
 #include <ssoclient/connection_spec.h>
@@ -32,10 +28,7 @@ using Tarvel::Exception;
 using Tarvel::Ref;
 using Testing::HeldService;
 using Testing::RunInChild;
-using Testing::ServerConnection;
-using Testing::ServerProcess;
 using Testing::Shared;
-using Testing::TlsSettings;
 using TokenPtr = std::shared_ptr<const SamlToken>;
 
 constexpr const char *SUBJECT = "{Name: alice; Domain:corp.example}";
