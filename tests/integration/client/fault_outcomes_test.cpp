@@ -3,10 +3,6 @@
 // one of `SecurityTokenService`, in each form, and the next operation works.
 
 #include "integration/client/fault_service.h"
-<<<<<<< HEAD
-#include "support/operation_forms.h"
-=======
->>>>>>> b9dac76497403709806e2f9db157b27efea5bd3e
 #include "support/data_file.h"
 #include "support/operation_forms.h"
 #include "support/soap_responses.h"
