@@ -19,5 +19,7 @@ ssoclient_mark(20 in_full
   PositionOfRefusal.IsAfterTextThatAWellFormedDocumentMayBeginWith
   DocumentBetweenGuardPages.IsReadAsElsewhere
   OneServiceOnSixteenThreadsOverTls.RunsTwentyThousandOperationsWithoutErrorOrGrowth
+  Over/ClientSoak.HasOneOutcomeForEachOperationAndDoesNotGrow/Tcp
+  Over/ClientSoak.HasOneOutcomeForEachOperationAndDoesNotGrow/Tls
   OneServiceOnSixteenThreads.ComposesReadsAndVerifiesTwentyThousandTimesWithoutErrorOrGrowth
   Of/Truncation.EveryPrefixIsRefusedByTheParser/bearer_50k)
