@@ -43,10 +43,29 @@ public:
     m_events.clear();
     m_model.events.clear();
     const std::string event = Act();
+    for (const std::string &text : m_events) {
+      ++m_kinds[KindOf(text)];
+    }
+    if (m_stage->issuer->CountOpen() > 1) {
+      return event + ": there are two requests";
+    }
     return m_events == m_model.events ? "" : event + "\nsource:" + Join(m_events) + "\nmodel:" + Join(m_model.events);
   }
 
+  /// How often each kind of event has been seen.
+  const std::map<std::string, int> &GetKinds() const { return m_kinds; }
+
 private:
+  /// "renew", "acquire", "token", or the outcome of a call that fails.
+  static std::string KindOf(const std::string &text) {
+    const std::size_t colon = text.find(": ");
+    if (colon == std::string::npos) {
+      return text.substr(0, text.find(' '));
+    }
+    const std::string outcome = text.substr(colon + 2);
+    return outcome.find(' ') == std::string::npos ? "token" : outcome;
+  }
+
   static std::string Join(const std::vector<std::string> &texts) {
     std::string joined;
     for (const std::string &text : texts) {
@@ -209,6 +228,7 @@ private:
   bool m_isProviderWell = true;
   std::vector<std::string> m_events;
   std::map<int, CancelSource> m_cancels;
+  std::map<std::string, int> m_kinds;
   int m_calls = 0;
   int m_tokens = 0;
 };
@@ -223,6 +243,13 @@ TEST(TokenSourceModel, DoesTheSameAsTheSourceAfterEachOfManyRandomEvents) {
   for (int event = 0; event < events; ++event) {
     ASSERT_EQ(run.Step(), "") << "event " << event << " of the seed " << seed << "; " << SEED << "=" << seed
                               << " repeats it";
+  }
+  for (const char *const kind :
+       {"acquire", "renew", "token", "CommunicationException: down", "SsoException: expired",
+        "SsoException: invalidated", "another: the provider failed", "CancelledException: The operation was cancelled",
+        "CancelledException: The operation was cancelled because its token source was destroyed",
+        "DeadlineExceededException: The deadline passed before the operation ended"}) {
+    EXPECT_GT(run.GetKinds().count(kind), 0U) << kind << " never happened with the seed " << seed;
   }
 }
 
