@@ -3,8 +3,8 @@
 // one of `SecurityTokenService`, in each form, and the next operation works.
 
 #include "integration/client/fault_service.h"
-#include "integration/client/operation_forms.h"
 #include "support/data_file.h"
+#include "support/operation_forms.h"
 #include "support/soap_responses.h"
 #include "support/unavailable_port.h"
 
@@ -60,9 +60,9 @@ const Fault FAULTS[] = {
     {"EndBeforeTheHeader", Reply(""), "CommunicationException: Bad response from "},
     {"EndWithinTheHeader", Reply("HTTP/1.1 200 OK\r\nConte"), "CommunicationException: Bad response from "},
     {"EndWithinTheBody", Reply(START + "<a>"), "CommunicationException: Bad response from "},
-    {"ResetBeforeTheHeader", ReplyAndReset(""), "CommunicationException: The connection to "},
-    {"ResetWithinTheHeader", ReplyAndReset("HTTP/1.1 200 OK\r\nConte"), "CommunicationException: The connection to "},
-    {"ResetWithinTheBody", ReplyAndReset(START + "<a>"), "CommunicationException: The connection to "},
+    {"ResetBeforeTheHeader", ReplyAndReset(""), "CommunicationException: The "},
+    {"ResetWithinTheHeader", ReplyAndReset("HTTP/1.1 200 OK\r\nConte"), "CommunicationException: The "},
+    {"ResetWithinTheBody", ReplyAndReset(START + "<a>"), "CommunicationException: The "},
     {"Garbage", Reply("\x01\x02\x03 this is not HTTP"), "CommunicationException: Bad response from "},
     {"EndlessHeader", ReplyWithoutEnd("HTTP/1.1 200 OK\r\n", "X: " + std::string(500, 'x') + "\r\n"),
      "CommunicationException: Bad response from "},
