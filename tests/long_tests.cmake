@@ -14,6 +14,7 @@ ssoclient_mark(30 in_full
   PrefixesOfDocuments.AreReadAlikeByAllReaders
   GeneratedDocuments.AreReadAlikeByAllReadersExceptForNamedDifferences)
 ssoclient_mark(20 in_full
+  TokenSourceModel.DoesTheSameAsTheSourceAfterEachOfManyRandomEvents
   PositionOfRefusal.IsOnTheLineThatLibxml2ReportsExceptForNamedDifferences
   PositionOfRefusal.IsAfterTextThatAWellFormedDocumentMayBeginWith
   DocumentBetweenGuardPages.IsReadAsElsewhere

@@ -119,7 +119,7 @@ private:
   static OperationEnding EndWithToken(std::shared_ptr<const SamlToken> token);
   void ForgetTask() noexcept;
   void Send(Request request);
-  void StartMessageLimit(unsigned exchange);
+  void StartMessageLimit(unsigned exchange, Clock::time_point end);
   void KeepRequest(unsigned exchange, Item item) noexcept;
   void OnResponse(const Tarvel::Exception *failure, Tarvel::Reader *response) noexcept;
   void OnMessageLimit(unsigned exchange) noexcept;
@@ -160,7 +160,7 @@ private:
   const RetryPolicy m_retryPolicy;
   const Executor m_executor;
   CancelToken m_cancelToken;
-  std::unique_ptr<const OperationFrame> m_frame;
+  OperationFrame m_frame;
   OperationEvents m_events;
 
   // Used by the step that runs.
