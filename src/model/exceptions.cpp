@@ -1,5 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 
+#include <ssoclient/client/exceptions.h>
 #include <ssoclient/exceptions.h>
 
 namespace SsoClient {
@@ -10,5 +11,7 @@ TARVEL_DEFINE_EXCEPTION(InvalidSignatureException)
 TARVEL_DEFINE_EXCEPTION(ParseException)
 TARVEL_DEFINE_EXCEPTION(CommunicationException)
 TARVEL_DEFINE_EXCEPTION(InvalidCredentialsException)
+TARVEL_DEFINE_EXCEPTION(CancelledException)
+TARVEL_DEFINE_EXCEPTION(DeadlineExceededException)
 
 } // namespace SsoClient

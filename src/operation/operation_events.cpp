@@ -6,6 +6,8 @@
 
 #include <tarvel/core/string_util.h>
 
+#include <utility>
+
 namespace SsoClient {
 
 namespace {
@@ -34,27 +36,19 @@ OperationEvents::OperationEvents(OperationObserver *observer, const char *name, 
 }
 
 void OperationEvents::Hide(const std::string &password) noexcept {
-  if (m_observer) {
-    m_mask.AddPassword(password);
-  }
+  Report("The mask", [&] { m_mask.AddPassword(password); });
 }
 
 void OperationEvents::HideToken(const SamlToken &token) noexcept {
-  if (m_observer) {
-    m_mask.AddToken(token);
-  }
+  Report("The mask", [&] { m_mask.AddToken(token); });
 }
 
 void OperationEvents::HideToken(const std::string &tokenXml) noexcept {
-  if (m_observer) {
-    m_mask.AddToken(tokenXml);
-  }
+  Report("The mask", [&] { m_mask.AddToken(tokenXml); });
 }
 
 void OperationEvents::HideLeg(const std::vector<std::uint8_t> &leg) noexcept {
-  if (m_observer) {
-    m_mask.AddLeg(leg);
-  }
+  Report("The mask", [&] { m_mask.AddLeg(leg); });
 }
 
 Tarvel::Ref<Tarvel::Reader> OperationEvents::Send(TransportSession &session, Request &request) {
@@ -63,18 +57,17 @@ Tarvel::Ref<Tarvel::Reader> OperationEvents::Send(TransportSession &session, Req
     session.SendRequest(request, response);
     return response;
   }
-  ReportSent(request);
-  const Clock::time_point sent = Clock::now();
+  BeginExchange(request);
   try {
     session.SendRequest(request, response);
   } catch (const std::exception &failure) {
-    ReportReceived(request.facts.get(), failure.what(), sent);
+    EndExchange(request.facts.get(), failure.what());
     throw;
   } catch (...) {
-    ReportReceived(request.facts.get(), "", sent);
+    EndExchange(request.facts.get(), "");
     throw;
   }
-  ReportReceived(request.facts.get(), "", sent);
+  EndExchange(request.facts.get(), "");
   return response;
 }
 
@@ -95,6 +88,14 @@ void OperationEvents::OnFault(const Tarvel::Xml::ElementNode &fault) noexcept {
 
 template <typename Call>
 void OperationEvents::Report(const char *subject, const Call &call) noexcept {
+  if (m_observer && BeginUse()) {
+    Guard(subject, call);
+    EndUse();
+  }
+}
+
+template <typename Call>
+void OperationEvents::Guard(const char *subject, const Call &call) noexcept {
   if (!m_observer) {
     return;
   }
@@ -105,27 +106,81 @@ void OperationEvents::Report(const char *subject, const Call &call) noexcept {
   }
 }
 
+/// @return false after the end
+bool OperationEvents::BeginUse() noexcept {
+  Use expected = Use::NONE;
+  return m_use.compare_exchange_strong(expected, Use::EVENT);
+}
+
+void OperationEvents::EndUse() noexcept {
+  Use expected = Use::EVENT;
+  if (!m_use.compare_exchange_strong(expected, Use::NONE)) {
+    ReportEnd();
+    m_endListener->OnEventsEnded();
+  }
+}
+
+bool OperationEvents::End(std::exception_ptr failure, EventsEndListener &listener) noexcept {
+  m_failure = std::move(failure);
+  m_endListener = &listener;
+  for (;;) {
+    Use expected = Use::NONE;
+    if (m_use.compare_exchange_strong(expected, Use::ENDED)) {
+      ReportEnd();
+      return true;
+    }
+    expected = Use::EVENT;
+    if (m_use.compare_exchange_strong(expected, Use::EVENT_BEFORE_END)) {
+      return false;
+    }
+  }
+}
+
+void OperationEvents::ReportEnd() noexcept {
+  const std::exception_ptr failure = std::move(m_failure);
+  if (m_observer) {
+    try {
+      if (failure) {
+        std::rethrow_exception(failure);
+      }
+      ReportSuccess();
+    } catch (const std::exception &exception) {
+      ReportFailure(&typeid(exception), exception.what());
+    } catch (...) {
+      ReportFailure(CurrentExceptionClass(), "");
+    }
+  }
+  m_mask = SecretMask();
+}
+
 std::shared_ptr<const ResponseHandler> OperationEvents::ListeningTo(const ResponseHandler &handler) noexcept {
   std::shared_ptr<const ResponseHandler> listening;
   Report("The observer's OnFault", [&] { listening = handler.WithFaultListener(*this); });
   return listening;
 }
 
-void OperationEvents::ReportSent(Request &request) noexcept {
-  m_mask.AddRequest(request.body);
-  Report("The place for the facts of a response", [&] { request.facts = std::make_shared<ResponseFacts>(); });
+void OperationEvents::BeginExchange(Request &request) noexcept {
+  Report("The mask", [&] { m_mask.AddRequest(request.body); });
+  Report("The place for the facts of a response", [&] {
+    if (!request.facts) {
+      request.facts = std::make_shared<ResponseFacts>();
+    }
+  });
   Report("The observer's OnRequestSent", [&] {
     m_observer->OnRequestSent(m_operation, {request.soapAction, request.body.size(), m_leg});
   });
+  if (m_observer) {
+    m_sent = Clock::now();
+  }
 }
 
-void OperationEvents::ReportReceived(const ResponseFacts *facts, const char *failure, Clock::time_point sent) noexcept {
+void OperationEvents::EndExchange(const ResponseFacts *facts, const char *failure) noexcept {
   if (!facts) {
     return; // there was no memory for the facts, so nothing is known about the response
   }
   Report("The observer's OnResponseReceived", [&] {
     ResponseReceivedEvent event;
-    event.durationMicroseconds = MicrosecondsSince(sent);
+    event.durationMicroseconds = MicrosecondsSince(m_sent);
     event.leg = m_leg;
     if (facts->status != 0) {
       event.status = facts->status;
@@ -140,7 +195,7 @@ void OperationEvents::ReportReceived(const ResponseFacts *facts, const char *fai
 }
 
 void OperationEvents::ReportSuccess() noexcept {
-  Report("The observer's OnEnded", [&] {
+  Guard("The observer's OnEnded", [&] {
     OperationEndedEvent event;
     event.durationMicroseconds = MicrosecondsSince(m_start);
     m_observer->OnEnded(m_operation, event);
@@ -161,7 +216,7 @@ void OperationEvents::ReportFailure(const std::type_info *exceptionClass, const 
     // Without memory, the end is reported without its texts.
     LogCaughtException(m_operation.id, "The description of the failure", m_mask);
   }
-  Report("The observer's OnEnded", [&] { m_observer->OnEnded(m_operation, event); });
+  Guard("The observer's OnEnded", [&] { m_observer->OnEnded(m_operation, event); });
 }
 
 } // namespace SsoClient

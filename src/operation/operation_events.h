@@ -16,6 +16,7 @@
 #include <tarvel/core/ref.h>
 #include <tarvel/io/reader.h>
 
+#include <atomic>
 #include <chrono>
 #include <cstddef>
 #include <cstdint>
@@ -29,8 +30,24 @@
 
 namespace SsoClient {
 
+/// Learns that the end of an operation has been reported.
+class EventsEndListener {
+public:
+  /// No event of the operation comes after this.
+  virtual void OnEventsEnded() noexcept = 0;
+
+protected:
+  EventsEndListener() = default;
+  EventsEndListener(const EventsEndListener &) = default;
+  EventsEndListener &operator=(const EventsEndListener &) = default;
+  ~EventsEndListener() = default;
+};
+
 /// The events of one operation. Without an observer, nothing is computed and no memory is used. What the observer
-/// throws is logged, and so is a lack of memory for an event; neither changes the operation. Used by one thread.
+/// throws is logged, and so is a lack of memory for an event; neither changes the operation.
+///
+/// One thread at a time uses the events of an operation, with one exception: `End` may be called on another thread while a
+/// step of the operation runs. Events that come after the end are dropped.
 class OperationEvents final : public FaultListener {
 public:
   /// The events of an operation that is not observed.
@@ -49,6 +66,12 @@ public:
   template <typename Call>
   std::invoke_result_t<const Call &> Run(const Call &call);
 
+  /// Reports the end once and forgets the secrets. Called once, for an operation that does not use `Run`.
+  /// @param failure null if the operation succeeded
+  /// @return false if another thread reports an event at this moment. That thread then reports the end, and calls
+  ///         `listener`.
+  bool End(std::exception_ptr failure, EventsEndListener &listener) noexcept;
+
   /// The identifier of the operation; empty if none was passed and there is no observer.
   const std::string &GetId() const noexcept { return m_observer ? m_operation.id : m_id; }
 
@@ -64,6 +87,13 @@ public:
   /// Sends `request`, and reports it and the response. With an observer, `request.facts` is set.
   Tarvel::Ref<Tarvel::Reader> Send(TransportSession &session, Request &request);
 
+  /// Reports that `request` is about to be sent, and sets its `facts`. For requests that nobody waits for.
+  void BeginExchange(Request &request) noexcept;
+
+  /// Reports the response, or why there is none.
+  /// @param facts those of the request; null if there was no memory for them
+  void EndExchange(const ResponseFacts *facts, const char *failure) noexcept;
+
   /// Calls `read` with a handler that does the same as `handler` and also reports faults.
   template <typename Read>
   void Receive(const ResponseHandler &handler, const Read &read);
@@ -73,11 +103,23 @@ public:
 private:
   using Clock = std::chrono::steady_clock;
 
+  /// What the object is used for at the moment.
+  enum class Use : unsigned char {
+    NONE,
+    EVENT,            ///< an event is reported
+    EVENT_BEFORE_END, ///< an event is reported, and `End` has been called
+    ENDED
+  };
+
+  /// Does `call` unless the operation has ended; logs what it throws.
   template <typename Call>
   void Report(const char *subject, const Call &call) noexcept;
+  template <typename Call>
+  void Guard(const char *subject, const Call &call) noexcept;
+  bool BeginUse() noexcept;
+  void EndUse() noexcept;
+  void ReportEnd() noexcept;
   std::shared_ptr<const ResponseHandler> ListeningTo(const ResponseHandler &handler) noexcept;
-  void ReportSent(Request &request) noexcept;
-  void ReportReceived(const ResponseFacts *facts, const char *failure, Clock::time_point sent) noexcept;
   void ReportSuccess() noexcept;
   void ReportFailure(const std::type_info *exceptionClass, const char *message) noexcept;
 
@@ -85,8 +127,12 @@ private:
   const std::string &m_id;
   OperationInfo m_operation;
   Clock::time_point m_start;
+  Clock::time_point m_sent;
   int m_leg = 0;
   SecretMask m_mask;
+  std::atomic<Use> m_use{Use::NONE};
+  std::exception_ptr m_failure; // with which the operation ended
+  EventsEndListener *m_endListener = nullptr;
 };
 
 template <typename Call>

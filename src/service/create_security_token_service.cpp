@@ -9,13 +9,6 @@
 
 namespace SsoClient {
 
-namespace {
-
-/// Four minutes, and not configurable. This is long because a service may have to ask other services before it answers.
-constexpr std::int64_t REQUEST_TIMEOUT_MICROSECONDS = 240000000;
-
-} // namespace
-
 std::shared_ptr<SecurityTokenService> CreateSecurityTokenService(const SecurityTokenServiceConfig &config) {
   return CreateSecurityTokenService(config, ServiceOptions());
 }

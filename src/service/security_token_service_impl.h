@@ -7,7 +7,7 @@
 #include "exchange/request_builder.h"
 #include "exchange/response_handler.h"
 #include "operation/operation_events.h"
-#include "operation/returned_tokens.h"
+#include "operation/token_steps.h"
 #include "transport/transport.h"
 
 #include <ssoclient/security_token_service.h>
@@ -59,9 +59,6 @@ public:
   /// @throws what `CreateSamlToken` throws, except that a ParseException becomes an SsoException with the same message.
   std::shared_ptr<const SamlToken> ToSamlToken(const std::string &xml) const;
 
-  /// The same, as a part of the operation to which `events` belong.
-  std::shared_ptr<const SamlToken> ToSamlToken(const std::string &xml, OperationEvents &events) const;
-
   /// Sends the first leg of a negotiation and sets `spnego` to the service's response.
   void StartSPNegotiation(TransportSession &session, const std::vector<std::uint8_t> &leg, const TokenSpec &spec,
                           SPNegoResponse &spnego) const;
@@ -75,18 +72,12 @@ public:
                              const std::string &contextId, SPNegoResponse &spnego, OperationEvents &events) const;
 
 private:
-  using ReadTokenXml = void (ResponseHandler::*)(Tarvel::Reader *, std::string &) const;
-
   /// Runs `operation` once with its events, between the first and the last line of its log.
   template <typename Operation>
   auto Run(const char *name, const Operation &operation) const;
   /// Posts in a new session. Session and request are destroyed before this returns, so that a password in the request
   /// does not stay in memory while the response is processed.
   Tarvel::Ref<Tarvel::Reader> Send(Request &&request, OperationEvents &events) const;
-  /// The verified token that `readTokenXml` finds in `response`; null when the text that it finds is empty.
-  std::shared_ptr<const SamlToken>
-  AcquireFrom(const Tarvel::Ref<Tarvel::Reader> &response, OperationEvents &events,
-              ReadTokenXml readTokenXml = &ResponseHandler::HandleAcquireTokenResponse) const;
   void SendLeg(TransportSession &session, Request &request, SPNegoResponse &spnego, OperationEvents &events) const;
   /// Exchanges legs until the service issues a token or something throws.
   void Negotiate(const TokenSpec &spec, NegotiationHandler &handler, SPNegoResponse &spnego,
@@ -95,8 +86,7 @@ private:
 
   std::shared_ptr<const RequestBuilder> m_requestBuilder;
   std::shared_ptr<const Transport> m_transport;
-  std::shared_ptr<const ResponseHandler> m_responseHandler;
-  std::shared_ptr<const ReturnedTokens> m_returnedTokens;
+  TokenSteps m_steps;
   std::shared_ptr<OperationObserver> m_observer;
 };
 

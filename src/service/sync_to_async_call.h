@@ -4,6 +4,8 @@
 
 #pragma once
 
+#include "operation/required_object.h"
+
 #include <ssoclient/saml_token.h>
 #include <tarvel/core/exception.h>
 #include <tarvel/system/thread_pool.h>
@@ -21,12 +23,7 @@ public:
 
   /// @throws Tarvel::InvalidArgumentException when there is no object. It is thrown here, where the operation runs, so that
   ///         it is reported like any other failure.
-  operator T &() const {
-    if (!m_object) {
-      throw Tarvel::InvalidArgumentException("a required object may not be NULL");
-    }
-    return *m_object;
-  }
+  operator T &() const { return Required(m_object); }
 
 private:
   std::shared_ptr<T> m_object;

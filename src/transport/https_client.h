@@ -16,6 +16,10 @@
 
 namespace SsoClient {
 
+/// The time for each request of the product's operations: four minutes, and not configurable. This is long because a service
+/// may have to ask other services before it answers.
+constexpr std::int64_t REQUEST_TIMEOUT_MICROSECONDS = 240000000;
+
 /// Posts to one address. Immutable, so any number of threads may use it.
 class HttpsClient final : public Transport {
 public:

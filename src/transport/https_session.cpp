@@ -44,9 +44,10 @@ void HttpsSession::SendRequest(const Request &request, Ref<Reader> &response) {
   try {
     Ref<ClientResponse> received;
     m_userAgent->WaitForRequest(pending, m_timeoutMicroseconds, received);
-    ReadFacts(received, request.facts.get());
+    ReadFacts(pending, received, request.facts.get());
     TranslateResponse(nullptr, received, error, body);
   } catch (const Exception &exception) {
+    ReadFacts(pending, nullptr, request.facts.get());
     TranslateResponse(&exception, nullptr, error, body);
   }
   if (error) {
@@ -77,10 +78,16 @@ void HttpsSession::Start(const Request &request, const Completion &completion,
       message,
       [completion, facts](const Exception *exception, const Ref<ClientResponse> &response,
                           const Ref<PendingRequestItem> &item) {
-        ReadFacts(response, facts.get());
+        ReadFacts(item, response, facts.get());
         AsyncTranslateResponse(completion, exception, response, item);
       },
       pending);
+}
+
+void HttpsSession::TimeOut(ScheduledItem &item) noexcept {
+  if (auto *const pending = dynamic_cast<PendingRequestItem *>(&item)) {
+    pending->TimeOut(m_timeoutMicroseconds);
+  }
 }
 
 void TranslateResponse(const Exception *exception, const Ref<ClientResponse> &response,
@@ -98,8 +105,13 @@ void TranslateResponse(const Exception *exception, const Ref<ClientResponse> &re
                                                    response->GetReasonPhrase());
 }
 
-void ReadFacts(const Ref<ClientResponse> &response, ResponseFacts *facts) noexcept {
-  if (!response || !facts) {
+void ReadFacts(const Ref<PendingRequestItem> &pending, const Ref<ClientResponse> &response,
+               ResponseFacts *facts) noexcept {
+  if (!facts) {
+    return;
+  }
+  facts->hasConnected = pending->HasConnected();
+  if (!response) {
     return;
   }
   facts->status = response->GetStatusCode();
@@ -107,6 +119,7 @@ void ReadFacts(const Ref<ClientResponse> &response, ResponseFacts *facts) noexce
   try {
     facts->reason = response->GetReasonPhrase();
     response->GetHeader("Content-Type", facts->contentType);
+    response->GetHeader("Retry-After", facts->retryAfter);
   } catch (const std::bad_alloc &) {
     // Without memory the texts are missing, but the response is not lost. NOLINT(bugprone-empty-catch)
   }

@@ -12,6 +12,7 @@
 #include <tarvel/http/user_agent.h>
 #include <tarvel/system/scheduled_item.h>
 
+#include <chrono>
 #include <cstdint>
 #include <memory>
 #include <string>
@@ -35,6 +36,11 @@ public:
   void SendRequestAsync(const Request &request, const Completion &completion,
                         Tarvel::Ref<Tarvel::Http::PendingRequestItem> &pending);
 
+  std::chrono::microseconds GetTimeout() const noexcept override {
+    return std::chrono::microseconds(m_timeoutMicroseconds);
+  }
+  void TimeOut(Tarvel::System::ScheduledItem &item) noexcept override;
+
 private:
   /// Posts the request. `facts` is written on the I/O thread, before the completion; null for none.
   void Start(const Request &request, const Completion &completion, const std::shared_ptr<ResponseFacts> &facts,
@@ -52,8 +58,9 @@ private:
 void TranslateResponse(const Tarvel::Exception *exception, const Tarvel::Ref<Tarvel::Http::ClientResponse> &response,
                        std::shared_ptr<const Tarvel::Exception> &error, Tarvel::Ref<Tarvel::Reader> &body);
 
-/// Sets `facts` to those of `response`; does nothing if either is null.
-void ReadFacts(const Tarvel::Ref<Tarvel::Http::ClientResponse> &response, ResponseFacts *facts) noexcept;
+/// Sets `facts`, unless it is null, to those of `pending` and of its response, which is null if there is none.
+void ReadFacts(const Tarvel::Ref<Tarvel::Http::PendingRequestItem> &pending,
+               const Tarvel::Ref<Tarvel::Http::ClientResponse> &response, ResponseFacts *facts) noexcept;
 
 /// Calls `completion` once, with the error and null or with null and the body of the response. The error is a
 /// `Tarvel::OutOfMemoryException` when memory runs out here. `pending` is not used; the user agent passes it.

@@ -11,13 +11,11 @@
 #include <tarvel/core/exception.h>
 #include <tarvel/core/ref.h>
 #include <tarvel/io/reader.h>
+#include <tarvel/system/scheduled_item.h>
 
+#include <chrono>
 #include <functional>
 #include <memory>
-
-namespace Tarvel::System {
-class ScheduledItem;
-} // namespace Tarvel::System
 
 namespace SsoClient {
 
@@ -37,9 +35,15 @@ public:
 
   /// Posts the request without waiting; `item` cancels it. `completion` runs on an I/O thread, where it must neither
   /// block nor wait for another request. The facts of the response are written on the same thread, before `completion`.
-  /// The product itself calls only `SendRequest`.
   virtual void SendRequestAsync(const Request &request, const Completion &completion,
                                 Tarvel::Ref<Tarvel::System::ScheduledItem> &item) = 0;
+
+  /// The time that each request may take. `SendRequest` holds it; callers of `SendRequestAsync` call `TimeOut`.
+  virtual std::chrono::microseconds GetTimeout() const noexcept { return std::chrono::minutes(4); }
+
+  /// Cancels a request of this session, whose completion gets the failure with which `SendRequest` ends after the time-out.
+  /// @param item what `SendRequestAsync` has returned
+  virtual void TimeOut(Tarvel::System::ScheduledItem &item) noexcept { item.Cancel(); }
 
 protected:
   TransportSession() = default;

@@ -12,6 +12,7 @@
 
 #include <boost/optional.hpp>
 
+#include <algorithm>
 #include <chrono>
 #include <memory>
 
@@ -56,10 +57,11 @@ struct CallOptions {
   /// The policy in place of the client's.
   boost::optional<RetryPolicy> retryPolicy;
 
-  /// Options with a deadline `timeout` from now. A negative time is a deadline that has passed.
+  /// Options with a deadline `timeout` from now, at most a hundred years. A negative time is a deadline that has passed.
   static CallOptions WithTimeout(std::chrono::milliseconds timeout) {
+    constexpr std::chrono::milliseconds LONGEST = std::chrono::hours(24 * 365 * 100); // no addition overflows
     CallOptions options;
-    options.deadline = Clock::now() + timeout;
+    options.deadline = Clock::now() + std::max(-LONGEST, std::min(timeout, LONGEST));
     return options;
   }
 };

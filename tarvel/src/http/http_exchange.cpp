@@ -243,8 +243,11 @@ void HttpExchange::RunGuarded(const Call &step) noexcept {
   }
 }
 
-std::shared_ptr<const Exception> HttpExchange::Cancelled() const noexcept {
+std::shared_ptr<const Exception> HttpExchange::Cancelled(std::chrono::microseconds exceededTimeout) const noexcept {
   try {
+    if (exceededTimeout.count() > 0) {
+      ThrowTimeout(exceededTimeout);
+    }
     throw System::NetworkException("The request to " + m_endpoint + " was cancelled");
   } catch (...) {
     return CurrentFailure(m_endpoint);
@@ -256,6 +259,7 @@ void HttpExchange::Finish(std::shared_ptr<const Exception> failure, const Ref<Cl
   Ref<System::Stream> stream;
   UserAgent::CompletionFunction completion;
   bool isCancelled = false;
+  std::chrono::microseconds exceededTimeout{0};
   {
     const std::lock_guard<ForkSafeMutex> lock(m_mutex);
     if (std::exchange(m_isFinishing, true)) {
@@ -264,9 +268,10 @@ void HttpExchange::Finish(std::shared_ptr<const Exception> failure, const Ref<Cl
     stream = std::move(m_stream);
     completion = std::exchange(m_completion, nullptr);
     isCancelled = m_isCancelled && !response;
+    exceededTimeout = m_exceededTimeout;
   }
   if (isCancelled) {
-    failure = Cancelled();
+    failure = Cancelled(exceededTimeout);
   }
   if (stream) {
     stream->Close();
@@ -305,12 +310,27 @@ Ref<ClientResponse> HttpExchange::Wait(std::chrono::microseconds timeout) {
   if (!m_done.wait_until(lock, deadline, [this] { return m_isDone; })) {
     lock.unlock();
     Cancel();
-    throw System::TimeoutException("No response from " + m_endpoint + " within " + DescribeSeconds(timeout));
+    ThrowTimeout(timeout);
   }
   if (m_failure) {
     m_failure->Throw();
   }
   return m_response;
+}
+
+void HttpExchange::ThrowTimeout(std::chrono::microseconds timeout) const {
+  throw System::TimeoutException("No response from " + m_endpoint + " within " + DescribeSeconds(timeout));
+}
+
+void HttpExchange::TimeOut(std::int64_t timeoutMicroseconds) noexcept {
+  {
+    const std::lock_guard<ForkSafeMutex> lock(m_mutex);
+    if (m_isFinishing || m_isCancelled) {
+      return;
+    }
+    m_exceededTimeout = std::max(std::chrono::microseconds(timeoutMicroseconds), std::chrono::microseconds(1));
+  }
+  Cancel();
 }
 
 void HttpExchange::Cancel() noexcept {

@@ -43,6 +43,7 @@ public:
   void Cancel() noexcept override;
   bool IsDone() const noexcept override;
   bool HasConnected() const noexcept override;
+  void TimeOut(std::int64_t timeoutMicroseconds) noexcept override;
 
 private:
   static constexpr std::size_t BUFFER_BYTES = 16 * 1024; // the content of one TLS record
@@ -65,7 +66,9 @@ private:
   /// Runs one step; an exception ends the exchange with that failure.
   template <typename Call>
   void RunGuarded(const Call &step) noexcept;
-  std::shared_ptr<const Exception> Cancelled() const noexcept;
+  /// The failure of a request that was cancelled.
+  std::shared_ptr<const Exception> Cancelled(std::chrono::microseconds exceededTimeout) const noexcept;
+  [[noreturn]] void ThrowTimeout(std::chrono::microseconds timeout) const;
   void Finish(std::shared_ptr<const Exception> failure, const Ref<ClientResponse> &response) noexcept;
   bool Abandon() noexcept;
   void Complete(const UserAgent::CompletionFunction &completion, const Exception *failure,
@@ -94,6 +97,7 @@ private:
   bool m_isConnectOver = false;
   bool m_hasConnected = false;
   bool m_isCancelled = false;
+  std::chrono::microseconds m_exceededTimeout{0}; // 0 unless the request was cancelled because it took too long
   bool m_isWriteOver = false;
   bool m_endWaitsForWrite = false;
   std::shared_ptr<const Exception> m_writeFailure;

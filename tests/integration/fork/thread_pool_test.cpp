@@ -32,11 +32,13 @@ TEST(ThreadPoolAfterFork, StartsItsOwnThreadsInTheChild) {
   const Ref<ThreadPool> own = CreateThreadPool(2);
   ASSERT_TRUE(Runs(*own));
   ASSERT_TRUE(Runs(*GetThreadPool())); // so that it has an idle thread, which does not exist in the child
+  ASSERT_TRUE(Runs(*GetComputePool()));
   EXPECT_EQ(RunInChild([&] {
               EXPECT_EQ(own->GetThreadCount(), 0u);
               EXPECT_EQ(own->GetThreadCeiling(), 2u);
               EXPECT_TRUE(Runs(*own));
               EXPECT_TRUE(Runs(*GetThreadPool()));
+              EXPECT_TRUE(Runs(*GetComputePool()));
               EXPECT_EQ(own->GetThreadCount(), 1u);
               EXPECT_EQ(RunInChild([&] { EXPECT_TRUE(Runs(*own)); }), "") << "the child's own child";
             }),

@@ -306,5 +306,25 @@ TEST_P(ThreadPoolCeiling, FinishesFiveHundredItemsThatWaitForTheNetwork) {
 
 INSTANTIATE_TEST_SUITE_P(Ceilings, ThreadPoolCeiling, testing::Values(1, 2, 8, 256), testing::PrintToStringParamName());
 
+TEST(ComputePool, IsOneForTheProcessAndNotThePoolForWorkThatBlocks) {
+  EXPECT_EQ(GetComputePool(), GetComputePool());
+  EXPECT_NE(GetComputePool(), GetThreadPool());
+}
+
+TEST(ComputePool, HasAtMostFourThreads) {
+  const Ref<ThreadPool> pool = GetComputePool();
+  EXPECT_EQ(pool->GetThreadCeiling(), 4u);
+  Gate gate;
+  std::vector<Ref<ScheduledItem>> items;
+  for (int i = 0; i < 20; ++i) {
+    items.push_back(pool->QueueWorkItem(gate.Wait()));
+  }
+  EXPECT_EQ(pool->GetThreadCount(), 4u);
+  gate.Open();
+  for (const Ref<ScheduledItem> &item : items) {
+    EXPECT_TRUE(Eventually([&item] { return item->IsDone(); }));
+  }
+}
+
 } // namespace
 } // namespace Tarvel::System

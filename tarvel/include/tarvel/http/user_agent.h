@@ -73,6 +73,10 @@ public:
   /// has been called.
   virtual bool HasConnected() const noexcept = 0;
 
+  /// Cancels the request. Its completion function gets the exception that `WaitForRequest` throws after a time-out of
+  /// `timeoutMicroseconds`.
+  virtual void TimeOut(std::int64_t timeoutMicroseconds) noexcept = 0;
+
 protected:
   ~PendingRequestItem() override;
 };

@@ -12,7 +12,8 @@ namespace SsoClient {
 /// the same new UUID.
 class OperationFrame {
 public:
-  explicit OperationFrame(const std::string &operationName);
+  /// @param className of the object that runs the operation; it is part of both lines
+  explicit OperationFrame(const std::string &operationName, const char *className = "SecurityTokenServiceImpl");
   OperationFrame(const OperationFrame &) = delete;
   OperationFrame &operator=(const OperationFrame &) = delete;
   ~OperationFrame();
@@ -23,6 +24,7 @@ public:
 private:
   std::string m_opId;
   std::string m_operationName;
+  const char *m_className;
 };
 
 } // namespace SsoClient

@@ -1,0 +1,66 @@
+// SPDX-License-Identifier: Apache-2.0
+/// @file
+/// `ScriptedTransport`, a transport without a network: a test decides when and how each request is answered.
+
+#pragma once
+
+#include "support/rendezvous.h"
+#include "transport/transport.h"
+
+#include <boost/optional.hpp>
+
+#include <chrono>
+#include <functional>
+#include <memory>
+#include <mutex>
+#include <string>
+#include <vector>
+
+namespace Testing {
+
+/// The answer to a request. With a failure there is no response.
+struct Reply {
+  std::string body;
+  std::string failure{}; ///< the text of a `CommunicationException`; empty for none
+  SsoClient::ResponseFacts facts{200, "OK", "text/xml", 0, "", true};
+};
+
+/// A response with that body.
+Reply Success(const std::string &body);
+/// No connection was made.
+Reply NoConnection();
+/// The status 503 with that value of Retry-After.
+Reply Unavailable(const std::string &retryAfter);
+
+/// Safe on any thread. Completions run on the platform's I/O threads.
+class ScriptedTransport final : public SsoClient::Transport {
+public:
+  /// The answer to a request; `boost::none` to hold it until the test answers or the client cancels it. May throw.
+  using Script = std::function<boost::optional<Reply>(const SsoClient::Request &request, int number)>;
+
+  explicit ScriptedTransport(Script script);
+
+  std::shared_ptr<SsoClient::TransportSession> CreateSession() const override;
+
+  /// Answers all requests that are held.
+  void AnswerHeld(const Reply &reply) const;
+
+  /// The bodies of the requests, each after the number of its session: "1: UserPass …".
+  std::vector<std::string> Sent() const;
+  /// Waits until that many requests have been sent.
+  bool WaitForSent(int count) const;
+  /// How many requests were cancelled, and how many ended by the limit for a message.
+  int CountCancelled() const;
+  int CountTimedOut() const;
+  /// How many sessions have not been released.
+  int CountOpenSessions() const;
+
+private:
+  struct State;
+  class Session;
+  class Pending;
+
+  const std::shared_ptr<State> m_state;
+};
+
+} // namespace Testing
