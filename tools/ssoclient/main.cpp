@@ -11,8 +11,10 @@
 #include <tarvel/crypto/system_configuration.h>
 
 #include <CLI/CLI.hpp>
+#include <boost/optional.hpp>
 
 #include <algorithm>
+#include <chrono>
 #include <exception>
 #include <map>
 #include <string>
@@ -136,7 +138,7 @@ std::string Explain(const CLI::App &app, const CLI::ParseError &error) {
   return message;
 }
 
-void AddOutputOptions(CLI::App &app, OutputOptions &output) {
+void AddCommonOptions(CLI::App &app, OutputOptions &output, boost::optional<std::chrono::microseconds> &timeout) {
   static const std::map<std::string, Format> FORMATS = {
       {"text", Format::TEXT}, {"json", Format::JSON}, {"xml", Format::XML}};
   app.add_option_function<std::string>(
@@ -146,6 +148,11 @@ void AddOutputOptions(CLI::App &app, OutputOptions &output) {
       ->check(CLI::IsMember({"text", "json", "xml"}))
       ->default_str("text")
       ->type_name("FORMAT");
+  AddOption(
+      app, "--timeout", timeout,
+      "How long the command may take, such as 2.5; then it ends with exit code 4. By default, it may take any time; "
+      "a request may take four minutes")
+      .TypeName("SECONDS");
   AddFlag(app, "-v,--verbose", output.verbose,
           "Write log lines, and the requests and responses without their content, to standard error; and warnings even "
           "when the format is json");
@@ -159,13 +166,14 @@ int Run(int argc, char **argv) {
   app.require_subcommand(1);
 
   OutputOptions output;
+  boost::optional<std::chrono::microseconds> timeout;
   bool usesSystemCrypto = false;
   Action chosen;
   for (const Command &command : COMMANDS) {
     CLI::App *sub = app.add_subcommand(command.name, command.summary);
     sub->footer(std::string("Examples:\n") + command.examples);
     sub->final_callback([&chosen, action = command.define(*sub, output)] { chosen = action; });
-    AddOutputOptions(*sub, output);
+    AddCommonOptions(*sub, output, timeout);
     sub->add_flag("--system-crypto", usesSystemCrypto,
                   "Use OpenSSL as this machine configures it, with its providers (FIPS, PKCS#11) and TLS settings");
   }
@@ -177,6 +185,7 @@ int Run(int argc, char **argv) {
   } catch (const CLI::ParseError &error) {
     throw UsageException(Explain(app, error) + "; see ssoclient --help");
   }
+  WatchCommand(timeout, output.format);
   if (output.verbose) {
     ShowLibraryLog();
   }
@@ -193,10 +202,11 @@ int main(int argc, char **argv) {
   using namespace SsoClient::Tool;
   try {
     KeepStandardStreamsApart();
-    CatchEndingSignals();
-    return Run(argc, argv);
+    const int exitCode = Run(argc, argv);
+    FinishCommand();
+    return exitCode;
   } catch (const std::exception &failure) {
-    ReportFailure(failure, RequestedFormat(argc, argv));
+    ReportAndFinish(failure, RequestedFormat(argc, argv));
     return static_cast<int>(Classify(failure).code);
   }
 }

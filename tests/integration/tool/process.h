@@ -33,7 +33,7 @@ Result RunTool(const std::vector<std::string> &arguments, const std::string &inp
 /// Runs `ShellCommand(commandLine)` in `folder`.
 Result RunShell(const std::string &commandLine, const std::string &folder = Testing::DataPath("tokens"));
 
-/// Starts the tool with a standard input that stays open and silent, sends it `signal` as soon as it catches that
+/// Starts the tool with a standard input that stays open and silent, sends it `signal` as soon as it waits for that
 /// signal, and returns how it ended.
 Result RunToolAndSignal(const std::vector<std::string> &arguments, int signal);
 
