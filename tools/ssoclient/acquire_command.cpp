@@ -7,6 +7,7 @@
 #include "credentials.h"
 #include "dialect_options.h"
 #include "identity.h"
+#include "interruption.h"
 #include "operation_events.h"
 #include "refused_token.h"
 #include "token_output.h"
@@ -48,10 +49,12 @@ ExitCode Acquire(const AcquireOptions &options, const OutputOptions &output) {
   serviceOptions.verifyOptions.profile = verifyOptions.profile; // the tolerance is checked below
   serviceOptions.observer = ObserverFor(output);
   serviceOptions.refusedTokenSink = refused.GetSink();
-  const auto service = CreateService(options.connection, trusted, LoadIdentity(options.identity), serviceOptions);
+  const auto client = CreateClient(options.connection, trusted, LoadIdentity(options.identity), serviceOptions);
   const IssuedToken issued = refused.Explain([&] {
-    IssuedToken acquired = kind.acquire({*service, spec, serviceOptions.dialect, hasIdentity, options.credentials,
-                                         options.connection.url, trusted, verifyOptions, output});
+    const DoubtedCredential given = kind.read({spec, serviceOptions.dialect, hasIdentity, options.credentials,
+                                               options.connection.url, trusted, verifyOptions});
+    IssuedToken acquired =
+        AskForToken([&] { return client->Acquire(given.credential, spec, GetCallOptions()); }, given.doubt, output);
     RequireWithinTolerance(*acquired.token, trusted, verifyOptions, refused.GetSink());
     return acquired;
   });
