@@ -2,6 +2,8 @@
 
 #include "client/token_cache_text.h"
 
+#include <algorithm>
+
 namespace SsoClient {
 
 namespace {
@@ -103,11 +105,12 @@ boost::optional<CachedToken> FindCachedToken(std::string_view text, const CacheB
   std::string_view end;
   std::string_view octets;
   if (!Take(text, BindingText(binding)) || !TakeLine(text, TOKEN_LINE, token.id) || !TakeLine(text, END_LINE, end) ||
-      !TakeLine(text, OCTETS_LINE, octets) || text.size() < LAST_LINE.size()) {
+      !TakeLine(text, OCTETS_LINE, octets)) {
     return boost::none;
   }
-  token.xml = text.substr(0, text.size() - LAST_LINE.size());
-  if (octets != std::to_string(token.xml.size()) || text.substr(token.xml.size()) != LAST_LINE) {
+  const std::size_t length = text.size() - std::min(text.size(), LAST_LINE.size());
+  token.xml = text.substr(0, length);
+  if (octets != std::to_string(length) || text.substr(length) != LAST_LINE) {
     return boost::none;
   }
   return token;

@@ -4,13 +4,7 @@
 
 #include "support/forked.h"
 #include "support/sanitized.h"
-#include "support/throws_message.h"
-#include "support/work_folder.h"
-#include "unit/token_cache/system_faults.h"
-
-#include <tarvel/core/exception.h>
-
-#include <boost/optional/optional_io.hpp>
+#include "unit/token_cache/private_file_fixture.h"
 
 #include <gtest/gtest.h>
 
@@ -27,14 +21,8 @@ namespace {
 
 using namespace Testing;
 using Tarvel::PrivateFile;
-using Names = std::set<std::string>;
 
-class PrivateFileProcesses : public ::testing::Test {
-protected:
-  const WorkFolder m_folder;
-  const std::string m_path = m_folder / "cache";
-  const PrivateFile m_file{m_path};
-};
+using PrivateFileProcesses = PrivateFileFixture;
 
 struct Counts {
   std::atomic<int> holders;

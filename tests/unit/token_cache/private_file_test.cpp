@@ -1,26 +1,15 @@
 // SPDX-License-Identifier: Apache-2.0
+// Which files are used, and which are refused.
 
 #include <tarvel/io/private_file.h>
 
 #include "support/forked.h"
-#include "support/process_resources.h"
-#include "support/throws_message.h"
-#include "support/work_folder.h"
-#include "unit/token_cache/system_faults.h"
-
-#include <tarvel/core/exception.h>
-
-#include <boost/optional/optional_io.hpp>
+#include "unit/token_cache/private_file_fixture.h"
 
 #include <gtest/gtest.h>
 
-#include <cerrno>
-#include <csignal>
-#include <cstdio>
 #include <string>
 
-#include <fcntl.h>
-#include <sys/resource.h>
 #include <sys/socket.h>
 #include <sys/stat.h>
 #include <sys/un.h>
@@ -31,50 +20,8 @@ namespace {
 using namespace Testing;
 using Tarvel::IOException;
 using Tarvel::PrivateFile;
-using Names = std::set<std::string>;
 
-mode_t ModeOf(const std::string &path) {
-  struct stat status = {};
-  EXPECT_EQ(::lstat(path.c_str(), &status), 0) << path;
-  return status.st_mode & 07777;
-}
-
-/// A folder with one private file in it, "cache". Each test checks that it leaves no descriptor open.
-class PrivateFileTest : public ::testing::Test {
-protected:
-  ~PrivateFileTest() override { EXPECT_EQ(CountDescriptors(), m_descriptors); }
-
-  /// Both ways to open the file are refused.
-  void ExpectRefusal(const std::string &reason) const {
-    const std::string message = "Cannot use " + m_path + ": " + reason;
-    EXPECT_THROWS_MESSAGE(m_file.Read(), IOException, message);
-    EXPECT_THROWS_MESSAGE(m_file.TryLock(), IOException, message);
-  }
-
-  void WritePrivately(const std::string &content) const { m_file.TryLock()->Replace(content); }
-
-  /// Expects that the content cannot be replaced, that the old one stays, and that the lock is still held.
-  void ExpectOldContentAfter(SystemFaults &faults, const std::string &message) const {
-    WritePrivately("old");
-    const auto lock = m_file.TryLock();
-    {
-      const ScopedFaults scope(faults);
-      EXPECT_THROWS_MESSAGE(lock->Replace("new content"), IOException, message);
-    }
-    EXPECT_EQ(m_file.Read(), std::string("old"));
-    EXPECT_EQ(m_folder.Names(), Names{"cache"});
-    EXPECT_EQ(m_file.TryLock(), nullptr);
-    lock->Replace("newer");
-    EXPECT_EQ(m_file.Read(), std::string("newer"));
-  }
-
-  const WorkFolder m_folder;
-  const std::string m_path = m_folder / "cache";
-  const PrivateFile m_file{m_path};
-
-private:
-  const std::size_t m_descriptors = CountDescriptors();
-};
+using PrivateFileTest = PrivateFileFixture;
 
 TEST_F(PrivateFileTest, RefusesAPathThatTheSystemWouldCut) {
   const char message[] = "Invalid argument : the path of a private file is empty or contains a NUL";
@@ -223,179 +170,6 @@ TEST_F(PrivateFileTest, NeedsPermissionForItsFolder) {
               EXPECT_THROWS_MESSAGE(file.TryLock(), IOException, message);
             }),
             "");
-}
-
-TEST_F(PrivateFileTest, IsReadAndWrittenWhenEachCallOfTheSystemIsInterrupted) {
-  SystemFaults faults;
-  faults.interruptsOften = true;
-  faults.largestWrite = 1000;
-  const ScopedFaults scope(faults);
-  const std::string content(100'000, 'x');
-  const auto lock = m_file.TryLock();
-  lock->Replace(content);
-  EXPECT_EQ(m_file.Read(), content);
-  lock->Clear();
-  EXPECT_EQ(m_file.Read(), std::string());
-}
-
-TEST_F(PrivateFileTest, SynchronisesTheFileBeforeAndTheFolderAfterItHasItsName) {
-  const auto lock = m_file.TryLock();
-  SystemFaults faults;
-  faults.beforeRename = [&faults] {
-    EXPECT_EQ(faults.synchronisedFiles, 1);
-    EXPECT_EQ(faults.synchronisedFolders, 0);
-  };
-  const ScopedFaults scope(faults);
-  lock->Replace("content");
-  EXPECT_EQ(faults.synchronisedFiles, 1);
-  EXPECT_EQ(faults.synchronisedFolders, 1);
-  EXPECT_EQ(faults.beforeRename, nullptr); // it was called
-}
-
-TEST_F(PrivateFileTest, KeepsItsContentWhenTheDiskIsFull) {
-  SystemFaults faults;
-  faults.space = 5;
-  ExpectOldContentAfter(faults, "Cannot write " + m_path + ": No space left on device");
-}
-
-TEST_F(PrivateFileTest, KeepsItsContentWhenTheDiskFails) {
-  SystemFaults faults;
-  faults.synchronisationError = EIO;
-  ExpectOldContentAfter(faults, "Cannot write " + m_path + ": Input/output error");
-}
-
-TEST_F(PrivateFileTest, KeepsItsContentWhenTheNewFileCannotBeRenamed) {
-  SystemFaults faults;
-  faults.renameError = EACCES;
-  ExpectOldContentAfter(faults, "Cannot write " + m_path + ": Permission denied");
-}
-
-TEST_F(PrivateFileTest, KeepsItsContentWhenTheNewFileCannotBeLocked) {
-  SystemFaults faults;
-  faults.lockError = ENOLCK;
-  ExpectOldContentAfter(faults, "Cannot lock " + m_path + ".new: No locks available");
-}
-
-TEST_F(PrivateFileTest, KeepsItsContentBeyondTheLimitOfTheProcessForFiles) {
-  WritePrivately("old");
-  EXPECT_EQ(RunInChild([&] {
-              std::signal(SIGXFSZ, SIG_IGN);
-              const rlimit limit{1000, 1000};
-              ASSERT_EQ(::setrlimit(RLIMIT_FSIZE, &limit), 0);
-              EXPECT_THROWS_MESSAGE(m_file.TryLock()->Replace(std::string(2000, 'x')), IOException,
-                                    "Cannot write " + m_path + ": File too large");
-            }),
-            "");
-  EXPECT_EQ(m_file.Read(), std::string("old"));
-  EXPECT_EQ(m_folder.Names(), Names{"cache"});
-}
-
-TEST_F(PrivateFileTest, ReportsAReadThatFails) {
-  WritePrivately("content");
-  SystemFaults faults;
-  faults.readError = EIO;
-  const ScopedFaults scope(faults);
-  EXPECT_THROWS_MESSAGE(m_file.Read(), IOException, "Cannot read " + m_path + ": Input/output error");
-}
-
-TEST_F(PrivateFileTest, ReportsALockThatCannotBeTaken) {
-  SystemFaults faults;
-  faults.lockError = ENOLCK;
-  const ScopedFaults scope(faults);
-  EXPECT_THROWS_MESSAGE(m_file.TryLock(), IOException, "Cannot lock " + m_path + ": No locks available");
-}
-
-TEST_F(PrivateFileTest, ReportsThatItCannotBeCleared) {
-  WritePrivately("content");
-  SystemFaults faults;
-  faults.truncationError = EIO;
-  const auto lock = m_file.TryLock();
-  const ScopedFaults scope(faults);
-  EXPECT_THROWS_MESSAGE(lock->Clear(), IOException, "Cannot write " + m_path + ": Input/output error");
-}
-
-TEST_F(PrivateFileTest, ReplacesWhatAKilledProcessLeft) {
-  m_folder.Write("cache.new", "half of a f");
-  WritePrivately("content");
-  EXPECT_EQ(m_file.Read(), std::string("content"));
-  EXPECT_EQ(m_folder.Names(), Names{"cache"});
-}
-
-TEST_F(PrivateFileTest, DoesNotFollowALinkInPlaceOfTheNewFile) {
-  m_folder.Write("victim", "untouched");
-  ASSERT_EQ(::symlink("victim", (m_folder / "cache.new").c_str()), 0);
-  WritePrivately("content");
-  EXPECT_EQ(m_folder.Read("victim"), "untouched");
-  EXPECT_EQ(m_file.Read(), std::string("content"));
-  EXPECT_EQ(m_folder.Names(), (Names{"cache", "victim"}));
-}
-
-TEST_F(PrivateFileTest, ReportsAFolderInPlaceOfTheNewFile) {
-  ASSERT_EQ(::mkdir((m_folder / "cache.new").c_str(), 0700), 0);
-  EXPECT_THROWS_MESSAGE(WritePrivately("content"), IOException, "Cannot replace " + m_path + ".new: Is a directory");
-}
-
-TEST_F(PrivateFileTest, HasOneHolderOfItsLockAlsoInOneProcess) {
-  auto lock = m_file.TryLock();
-  EXPECT_EQ(PrivateFile(m_path).TryLock(), nullptr);
-  lock.reset();
-  EXPECT_NE(PrivateFile(m_path).TryLock(), nullptr);
-}
-
-TEST_F(PrivateFileTest, StaysLockedWhenItIsReplaced) {
-  auto lock = m_file.TryLock();
-  lock->Replace("first");
-  EXPECT_EQ(m_file.TryLock(), nullptr);
-  lock->Replace("second");
-  EXPECT_EQ(m_file.TryLock(), nullptr);
-  lock->Clear();
-  EXPECT_EQ(m_file.TryLock(), nullptr);
-  lock.reset();
-  EXPECT_NE(m_file.TryLock(), nullptr);
-}
-
-TEST_F(PrivateFileTest, IsLockedBeforeTheNewFileHasItsName) {
-  const auto lock = m_file.TryLock();
-  SystemFaults faults;
-  faults.beforeRename = [this] { EXPECT_EQ(PrivateFile(m_path + ".new").TryLock(), nullptr); };
-  const ScopedFaults scope(faults);
-  lock->Replace("content");
-  EXPECT_EQ(faults.beforeRename, nullptr);
-}
-
-TEST_F(PrivateFileTest, IsLockedAndNotTheFileThatItReplacedInTheMeantime) {
-  WritePrivately("old");
-  m_folder.Write("other", "new");
-  ASSERT_EQ(::chmod((m_folder / "other").c_str(), 0600), 0);
-  SystemFaults faults;
-  faults.beforeLock = [this] { ASSERT_EQ(std::rename((m_folder / "other").c_str(), m_path.c_str()), 0); };
-  const ScopedFaults scope(faults);
-  const auto lock = m_file.TryLock();
-  EXPECT_EQ(lock->Read(), "new");
-  EXPECT_EQ(m_file.TryLock(), nullptr);
-}
-
-TEST_F(PrivateFileTest, IsMadeAgainIfItIsRemovedBeforeItIsLocked) {
-  SystemFaults faults;
-  faults.beforeLock = [this] { ASSERT_EQ(::unlink(m_path.c_str()), 0); };
-  const ScopedFaults scope(faults);
-  const auto lock = m_file.TryLock();
-  EXPECT_EQ(m_folder.Names(), Names{"cache"});
-  EXPECT_EQ(m_file.TryLock(), nullptr);
-}
-
-TEST_F(PrivateFileTest, IsClosedInProgramsThatTheProcessExecutes) {
-  const auto lock = m_file.TryLock();
-  lock->Replace("content");
-  int inherited = 0;
-  for (int descriptor = 3; descriptor < 1024; ++descriptor) {
-    struct stat opened = {};
-    struct stat named = {};
-    if (::fstat(descriptor, &opened) == 0 && ::stat(m_path.c_str(), &named) == 0 && opened.st_ino == named.st_ino) {
-      inherited += (::fcntl(descriptor, F_GETFD) & FD_CLOEXEC) == 0 ? 1 : 0;
-    }
-  }
-  EXPECT_EQ(inherited, 0);
 }
 
 TEST_F(PrivateFileTest, KeepsItsMessageShortForALongPath) {
