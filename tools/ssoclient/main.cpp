@@ -41,31 +41,37 @@ constexpr Command COMMANDS[] = {
      "  ssoclient acquire --sts https://sts.corp.example/sts --ca ca.pem --trust sts.pem --gss\n"
      "  ssoclient acquire --sts https://sts.corp.example/sts --ca ca.pem --trust sts.pem \\\n"
      "      --gss --service HTTP/sts.corp.example@CORP.EXAMPLE --client-keytab robot.keytab\n",
-     DefineAcquire},
+     Format::TEXT, DefineAcquire},
+    {"token", "Print a fresh token; ask the service for one only when the cache has none",
+     "  ssoclient token --cache alice.cache --sts https://sts.corp.example/sts --ca ca.pem --trust sts.pem \\\n"
+     "      --user alice@corp.example --password-file password.txt\n"
+     "  ssoclient token --cache client.cache --sts https://sts.corp.example/sts --ca ca.pem --trust sts.pem \\\n"
+     "      --cert client.pem --key client.key --timeout 10 --out client.xml --force\n",
+     Format::XML, DefineToken},
     {"renew", "Ask the service for a new token to replace a renewable one",
      "  ssoclient renew --sts https://sts.corp.example/sts --ca ca.pem --trust sts.pem \\\n"
      "      --cert client.pem --key client.key --lifetime 1d --out client.xml --force client.xml\n",
-     DefineRenew},
+     Format::TEXT, DefineRenew},
     {"validate", "Ask the service whether a token is valid",
-     "  ssoclient validate --sts https://sts.corp.example/sts --ca ca.pem --trust sts.pem client.xml\n",
+     "  ssoclient validate --sts https://sts.corp.example/sts --ca ca.pem --trust sts.pem client.xml\n", Format::TEXT,
      DefineValidate},
     {"verify", "Check a token as a relying service does, and show what it says",
      "  ssoclient verify --trust sts.pem token.xml\n"
      "  ssoclient verify --trust sts.pem --explain token.xml\n"
      "  ssoclient verify --trust sts.pem --trust next-sts.pem --tolerance 60 --format json - <token.xml\n",
-     DefineVerify},
+     Format::TEXT, DefineVerify},
     {"inspect", "Show what a token says, and how it deviates from the accepted form, without verifying it",
      "  ssoclient inspect token.xml\n"
      "  ssoclient inspect --format json - <token.xml\n",
-     DefineInspect},
+     Format::TEXT, DefineInspect},
     {"doctor", "Find out why a service cannot be used, without sending it any credential",
      "  ssoclient doctor --sts https://sts.corp.example/sts --ca ca.pem --trust sts.pem\n"
      "  ssoclient doctor --sts https://sts.corp.example/sts --ca ca.pem --timeout 5 --format json\n",
-     DefineDoctor},
+     Format::TEXT, DefineDoctor},
     {"dialect", "List the known dialects of services, or write one as JSON that can be edited",
      "  ssoclient dialect --format json\n"
      "  ssoclient dialect cxf >partner.json; ssoclient dialect partner.json\n",
-     DefineDialect},
+     Format::TEXT, DefineDialect},
 };
 
 /// The format that the command line asks for; works also for a command line that has errors.
@@ -138,7 +144,8 @@ std::string Explain(const CLI::App &app, const CLI::ParseError &error) {
   return message;
 }
 
-void AddCommonOptions(CLI::App &app, OutputOptions &output, boost::optional<std::chrono::microseconds> &timeout) {
+void AddCommonOptions(CLI::App &app, Format format, OutputOptions &output,
+                      boost::optional<std::chrono::microseconds> &timeout) {
   static const std::map<std::string, Format> FORMATS = {
       {"text", Format::TEXT}, {"json", Format::JSON}, {"xml", Format::XML}};
   app.add_option_function<std::string>(
@@ -146,7 +153,7 @@ void AddCommonOptions(CLI::App &app, OutputOptions &output, boost::optional<std:
          "Format of the result; xml is the token itself")
       ->check(RefuseEmpty)
       ->check(CLI::IsMember({"text", "json", "xml"}))
-      ->default_str("text")
+      ->default_str(format == Format::XML ? "xml" : "text")
       ->type_name("FORMAT");
   AddOption(
       app, "--timeout", timeout,
@@ -172,8 +179,14 @@ int Run(int argc, char **argv) {
   for (const Command &command : COMMANDS) {
     CLI::App *sub = app.add_subcommand(command.name, command.summary);
     sub->footer(std::string("Examples:\n") + command.examples);
-    sub->final_callback([&chosen, action = command.define(*sub, output)] { chosen = action; });
-    AddCommonOptions(*sub, output, timeout);
+    const Action action = command.define(*sub, output);
+    AddCommonOptions(*sub, command.format, output, timeout);
+    sub->final_callback([&chosen, &output, action, sub, format = command.format] {
+      chosen = action;
+      if (sub->count("--format") == 0) {
+        output.format = format;
+      }
+    });
     sub->add_flag("--system-crypto", usesSystemCrypto,
                   "Use OpenSSL as this machine configures it, with its providers (FIPS, PKCS#11) and TLS settings");
   }

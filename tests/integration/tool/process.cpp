@@ -126,7 +126,8 @@ void Finish(const Process &process, Result &result) {
   result.exitCode = WIFEXITED(status) ? WEXITSTATUS(status) : 128 + WTERMSIG(status);
 }
 
-/// Whether the main thread of process `id` leaves `signal` to another thread.
+} // namespace
+
 bool Blocks(pid_t id, int signal) {
   std::ifstream status("/proc/" + std::to_string(id) + "/status");
   for (std::string word; status >> word;) {
@@ -138,8 +139,6 @@ bool Blocks(pid_t id, int signal) {
   }
   return false;
 }
-
-} // namespace
 
 void ResetSignals() {
   for (const int signal : {SIGINT, SIGQUIT, SIGPIPE, SIGHUP, SIGTERM}) {
