@@ -35,12 +35,13 @@ std::string FolderOf(const std::string &path) {
 class TemporaryFile {
 public:
   explicit TemporaryFile(const std::string &finalPath)
-      : m_finalPath(finalPath), m_path(FolderOf(finalPath) + "/.ssoclient-XXXXXX"),
-        m_descriptor(mkostemp(m_path.data(), O_CLOEXEC)) { // of mode 0600
-    if (m_descriptor < 0) {
-      ThrowSystemError(m_finalPath, errno);
-    }
-  }
+      : m_finalPath(finalPath), m_path(FolderOf(finalPath) + "/.ssoclient-XXXXXX"), m_unfinished([this] {
+          m_descriptor = mkostemp(m_path.data(), O_CLOEXEC); // of mode 0600
+          if (m_descriptor < 0) {
+            ThrowSystemError(m_finalPath, errno);
+          }
+          return m_path;
+        }) {}
   TemporaryFile(const TemporaryFile &) = delete;
   TemporaryFile &operator=(const TemporaryFile &) = delete;
   ~TemporaryFile() {
@@ -84,8 +85,9 @@ public:
 private:
   std::string m_finalPath;
   std::string m_path;
-  int m_descriptor;
+  int m_descriptor = -1;
   bool m_isPublished = false;
+  const UnfinishedFile m_unfinished; // last: it ends before the others, after the destructor's body
 };
 
 } // namespace
@@ -109,7 +111,6 @@ void RequireWritableFile(const std::string &path, bool replace) {
 }
 
 void WriteFileWhole(const std::string &path, std::string_view content, bool replace) {
-  const SignalsHeldBack held;
   RequireWritableFile(path, replace);
   TemporaryFile file(path);
   file.Write(content);

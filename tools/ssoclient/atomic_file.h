@@ -16,7 +16,7 @@ void RequireWritableFile(const std::string &path, bool replace);
 
 /// Makes `path` a file of mode 0600 that contains `content`. At every moment, `path` is as it was before, or it has the
 /// whole content, even when a signal ends the process. A file that already exists is an error unless
-/// `replace` is set. Main thread only.
+/// `replace` is set.
 /// @throws Tarvel::IOException naming the path.
 void WriteFileWhole(const std::string &path, std::string_view content, bool replace);
 

@@ -23,11 +23,14 @@ struct Command {
   const char *summary;
   const char *examples; ///< command lines, shown at the end of the help
 
+  Format format; ///< without --format
+
   /// Adds the command's own options to `app`, and returns the action, which uses their values. `output` outlives both.
   Action (*define)(CLI::App &app, const OutputOptions &output);
 };
 
 Action DefineAcquire(CLI::App &app, const OutputOptions &output);
+Action DefineToken(CLI::App &app, const OutputOptions &output);
 Action DefineRenew(CLI::App &app, const OutputOptions &output);
 Action DefineValidate(CLI::App &app, const OutputOptions &output);
 Action DefineVerify(CLI::App &app, const OutputOptions &output);

@@ -95,18 +95,20 @@ Tarvel::Ref<Tarvel::Ssl::SSLContext> CreateContext(const ConnectionOptions &opti
   return context;
 }
 
-std::shared_ptr<SecurityTokenService> CreateService(const ConnectionOptions &options,
-                                                    const Tarvel::Crypto::CertificateList &trusted,
-                                                    const boost::optional<HolderOfKeyConfig> &identity,
-                                                    const ServiceOptions &serviceOptions) {
+std::shared_ptr<const TokenClient> CreateClient(const ConnectionOptions &options,
+                                                const Tarvel::Crypto::CertificateList &trusted,
+                                                const boost::optional<HolderOfKeyConfig> &identity,
+                                                const ServiceOptions &serviceOptions) {
   SecurityTokenServiceConfig config;
   config.stsUrl = options.url;
   config.signingCertificates = trusted;
   config.sslParameter = options.thumbprint;
   config.holderOfKeyConfig = identity;
   const Tarvel::Ref<Tarvel::Ssl::SSLContext> context = CreateContext(options);
-  config.sslContext = context.get();                         // null for plain http
-  return CreateSecurityTokenService(config, serviceOptions); // takes its own reference to the context
+  config.sslContext = context.get(); // null for plain http; the client takes its own reference
+  ClientOptions clientOptions;
+  clientOptions.service = serviceOptions;
+  return std::make_shared<const TokenClient>(config, clientOptions);
 }
 
 } // namespace SsoClient::Tool

@@ -4,8 +4,8 @@
 
 #pragma once
 
+#include <ssoclient/client/token_client.h>
 #include <ssoclient/holder_of_key_config.h>
-#include <ssoclient/security_token_service.h>
 #include <ssoclient/service_options.h>
 #include <tarvel/core/ref.h>
 #include <tarvel/crypto/certificate.h>
@@ -43,9 +43,9 @@ Tarvel::Ref<Tarvel::Ssl::SSLContext> CreateContext(const ConnectionOptions &opti
 
 /// A client of the service. Nothing is connected yet.
 /// @throws Tarvel::IOException, Tarvel::Crypto::CryptoException
-std::shared_ptr<SecurityTokenService> CreateService(const ConnectionOptions &options,
-                                                    const Tarvel::Crypto::CertificateList &trusted,
-                                                    const boost::optional<HolderOfKeyConfig> &identity,
-                                                    const ServiceOptions &serviceOptions);
+std::shared_ptr<const TokenClient> CreateClient(const ConnectionOptions &options,
+                                                const Tarvel::Crypto::CertificateList &trusted,
+                                                const boost::optional<HolderOfKeyConfig> &identity,
+                                                const ServiceOptions &serviceOptions);
 
 } // namespace SsoClient::Tool

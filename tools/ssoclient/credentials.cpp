@@ -21,7 +21,7 @@ constexpr Doubt EXCHANGE_OF_BEARER_TOKEN = {
 
 /// A request for a delegated token is not signed, even when it asks for a token that is bound to a key. Services that
 /// take the key from the certificate in wst:UseKey may grant it nevertheless.
-const Doubt *DoubtAboutDelegation(const AcquireCall &call) {
+const Doubt *DoubtAboutDelegation(const CredentialsCall &call) {
   const bool asksForBoundToken = call.hasIdentity && call.spec.confirmation == TokenSpec::CONFIRMATION_DEFAULT;
   const bool containsCertificate = call.dialect.useKey == ServiceDialect::UseKey::CERTIFICATE;
   return asksForBoundToken && call.spec.delegateTo && !containsCertificate ? &DELEGATION_WITHOUT_PROOF : nullptr;
@@ -29,11 +29,11 @@ const Doubt *DoubtAboutDelegation(const AcquireCall &call) {
 
 void CheckNothing(const TokenSpec &, bool) {}
 
-IssuedToken AcquireByPassword(const AcquireCall &call) {
+DoubtedCredential ReadPassword(const CredentialsCall &call) {
   const CredentialsOptions &credentials = call.credentials;
-  const Tarvel::SecretText password = ReadSecret(credentials.password, "Password for " + credentials.user + ": ");
-  return AskForToken([&] { return call.service.AcquireToken(credentials.user, password.Get(), call.spec); },
-                     DoubtAboutDelegation(call), call.output);
+  return {
+      PasswordCredential{credentials.user, ReadSecret(credentials.password, "Password for " + credentials.user + ": ")},
+      DoubtAboutDelegation(call)};
 }
 
 void CheckExchange(const TokenSpec &, bool hasIdentity) {
@@ -42,20 +42,19 @@ void CheckExchange(const TokenSpec &, bool hasIdentity) {
   }
 }
 
-IssuedToken AcquireByToken(const AcquireCall &call) {
+DoubtedCredential ReadTokenToExchange(const CredentialsCall &call) {
   const auto given = ReadToken(call.credentials.tokenFile, call.trusted, call.verifyOptions);
   // The request's signature refers to the token, from which the service takes the key. A bearer token has no key.
   const Doubt *const doubt = given->GetConfirmationMethod() == SamlToken::BEARER ? &EXCHANGE_OF_BEARER_TOKEN : nullptr;
-  return AskForToken([&] { return call.service.AcquireTokenByToken(*given, call.spec); }, doubt, call.output);
+  return {TokenCredential{given}, doubt};
 }
 
 void CheckGss(const TokenSpec &, bool) {
   RequireGss();
 }
 
-IssuedToken AcquireByTicket(const AcquireCall &call) {
-  return AskForToken([&] { return AcquireByGss(call.service, call.spec, call.credentials.gss, call.url); },
-                     DoubtAboutDelegation(call), call.output);
+DoubtedCredential UseTicket(const CredentialsCall &call) {
+  return {ToCredential(call.credentials.gss, call.url), DoubtAboutDelegation(call)};
 }
 
 void CheckCertificate(const TokenSpec &spec, bool) {
@@ -64,19 +63,18 @@ void CheckCertificate(const TokenSpec &spec, bool) {
   }
 }
 
-IssuedToken AcquireByCertificate(const AcquireCall &call) {
-  return AskForToken([&] { return call.service.AcquireTokenByCertificate(call.spec); }, nullptr, call.output);
+DoubtedCredential UseIdentity(const CredentialsCall & /*call*/) {
+  return {CertificateCredential{}, nullptr};
 }
 
 constexpr CredentialsKind CHOSEN_KINDS[] = {
-    {"--user", [](const CredentialsOptions &options) { return !options.user.empty(); }, CheckNothing,
-     AcquireByPassword},
+    {"--user", [](const CredentialsOptions &options) { return !options.user.empty(); }, CheckNothing, ReadPassword},
     {"--token", [](const CredentialsOptions &options) { return !options.tokenFile.empty(); }, CheckExchange,
-     AcquireByToken},
-    {"--gss", [](const CredentialsOptions &options) { return options.gss.isChosen; }, CheckGss, AcquireByTicket},
+     ReadTokenToExchange},
+    {"--gss", [](const CredentialsOptions &options) { return options.gss.isChosen; }, CheckGss, UseTicket},
 };
 
-constexpr CredentialsKind IDENTITY_ALONE = {nullptr, nullptr, CheckCertificate, AcquireByCertificate};
+constexpr CredentialsKind IDENTITY_ALONE = {nullptr, nullptr, CheckCertificate, UseIdentity};
 
 [[noreturn]] void ThrowNoneChosen() {
   std::string options;
@@ -93,6 +91,11 @@ void AddGssOptions(CLI::App &app, GssOptions &options) {
   AddOption(
       app, "--service", options.service,
       "The token service's principal, such as HTTP@host or HTTP/host@REALM; by default, HTTP@ and the host of --sts")
+      .TypeName("PRINCIPAL")
+      .Group(GROUP)
+      .Needs(gss);
+  AddOption(app, "--principal", options.client,
+            "Principal whose ticket is used, such as alice@CORP.EXAMPLE; by default, the first of the cache or keytab")
       .TypeName("PRINCIPAL")
       .Group(GROUP)
       .Needs(gss);

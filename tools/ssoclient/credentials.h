@@ -10,7 +10,7 @@
 #include "service_call.h"
 #include "trust.h"
 
-#include <ssoclient/security_token_service.h>
+#include <ssoclient/client/credential.h>
 #include <ssoclient/service_dialect.h>
 #include <ssoclient/token_spec.h>
 
@@ -30,9 +30,8 @@ struct CredentialsOptions {
   GssOptions gss;
 };
 
-/// What is needed to acquire a token, for every kind of credentials.
-struct AcquireCall {
-  const SecurityTokenService &service;
+/// What decides about a credential, for every kind.
+struct CredentialsCall {
   const TokenSpec &spec;
   const ServiceDialect &dialect;
   bool hasIdentity;
@@ -40,7 +39,12 @@ struct AcquireCall {
   const std::string &url; ///< of the service
   const Tarvel::Crypto::CertificateList &trusted;
   const VerifyOptions &verifyOptions;
-  const OutputOptions &output;
+};
+
+/// A credential, and why the service may refuse the request that uses it.
+struct DoubtedCredential {
+  Credential credential;
+  const Doubt *doubt; ///< null when there is none
 };
 
 /// One row of the table of kinds.
@@ -51,8 +55,8 @@ struct CredentialsKind {
   /// @throws UsageException when the rest of the command line contradicts the kind.
   void (*check)(const TokenSpec &spec, bool hasIdentity);
 
-  /// Reads what the kind needs, and calls the service.
-  IssuedToken (*acquire)(const AcquireCall &call);
+  /// Reads what the kind needs.
+  DoubtedCredential (*read)(const CredentialsCall &call);
 };
 
 void AddCredentialsOptions(CLI::App &app, CredentialsOptions &options);

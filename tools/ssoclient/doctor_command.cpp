@@ -8,6 +8,7 @@
 #include "doctor_exchange.h"
 #include "doctor_network.h"
 #include "doctor_tls.h"
+#include "interruption.h"
 #include "option.h"
 #include "terminal_style.h"
 
@@ -16,6 +17,8 @@
 
 #include <boost/optional.hpp>
 
+#include <algorithm>
+#include <chrono>
 #include <cstdint>
 #include <memory>
 #include <string>
@@ -27,16 +30,21 @@
 namespace SsoClient::Tool {
 namespace {
 
-using Tarvel::System::MICROSECONDS_PER_SECOND;
-
-constexpr std::int64_t DEFAULT_TIMEOUT_SEC = 10;
-constexpr std::int64_t MAX_TIMEOUT_SEC = 3600;
+/// How long each step may take without --timeout.
+constexpr std::chrono::microseconds DEFAULT_STEP = std::chrono::seconds(10);
+/// How much of the time of --timeout is left to show what was found; half of a shorter time.
+constexpr std::chrono::microseconds TIME_TO_SHOW = std::chrono::milliseconds(500);
 
 struct DoctorOptions {
   ConnectionOptions connection;
   std::vector<std::string> trustFiles;
-  std::int64_t timeoutSec = DEFAULT_TIMEOUT_SEC;
 };
+
+/// How long one step may take: a step that hangs must end before the command must, so that the others are shown.
+std::chrono::microseconds StepLimit() {
+  const auto limit = GetTimeLimit();
+  return limit ? *limit - std::min(*limit / 2, TIME_TO_SHOW) : DEFAULT_STEP;
+}
 
 DoctorTarget TargetOf(const std::string &url) {
   DoctorTarget target;
@@ -59,7 +67,7 @@ std::vector<DoctorCheck> Examine(const DoctorOptions &options, const std::vector
   const DoctorTarget target = TargetOf(options.connection.url);
   const auto context = CreateContext(options.connection);
   const std::string &thumbprint = options.connection.thumbprint;
-  const std::int64_t timeout = options.timeoutSec * MICROSECONDS_PER_SECOND;
+  const std::int64_t timeout = StepLimit().count();
   const auto probe = Tarvel::Ssl::ProbeServer(target.host, target.port, context, thumbprint, timeout);
   const Tarvel::System::DateTime now = Tarvel::System::GetUtcDateTime();
 
@@ -96,10 +104,6 @@ Action DefineDoctor(CLI::App &app, const OutputOptions &output) {
   AddOption(app, "--trust", options->trustFiles,
             "File of the service's certificates, PEM or DER, to be checked; may be repeated")
       .TypeName("CERT");
-  AddOption(app, "--timeout", options->timeoutSec, "How many seconds each step may take")
-      .ShowDefault()
-      .TypeName("S")
-      .Within(1, MAX_TIMEOUT_SEC);
   return [options, &output] { return Diagnose(*options, output); };
 }
 

@@ -4,6 +4,7 @@
 
 #include "exit_code.h"
 
+#include <ssoclient/client/exceptions.h>
 #include <ssoclient/exceptions.h>
 #ifdef SSOCLIENT_TOOL_HAS_GSSAPI
 #include <ssoclient/gssapi/exceptions.h>
@@ -58,6 +59,8 @@ constexpr Row TABLE[] = {
 #endif
     {IsA<InvalidCredentialsException>,
      {ExitCode::CREDENTIALS_REFUSED, "InvalidCredentialsException", "credentials refused"}},
+    {IsA<DeadlineExceededException>, {ExitCode::COMMUNICATION, "DeadlineExceededException", "timed out"}},
+    {IsA<CancelledException>, {ExitCode::COMMUNICATION, "CancelledException", "cancelled"}},
     {IsA<CommunicationException>, {ExitCode::COMMUNICATION, "CommunicationException", "communication failed"}},
     {IsA<ParseException>, {ExitCode::TOKEN_INVALID, "ParseException", "token invalid"}},
     {IsA<Tarvel::Xml::XMLParseException>, {ExitCode::TOKEN_INVALID, "XMLParseException", "token invalid"}},

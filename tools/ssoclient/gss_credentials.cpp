@@ -22,13 +22,14 @@ std::string UsualService(const std::string &url) {
 
 void RequireGss() {}
 
-std::shared_ptr<const SamlToken> AcquireByGss(const SecurityTokenService &service, const TokenSpec &spec,
-                                              const GssOptions &options, const std::string &url) {
+NegotiationCredential ToCredential(const GssOptions &options, const std::string &url) {
   Gssapi::SpnegoSettings settings;
   settings.service = options.service.empty() ? UsualService(url) : options.service;
+  settings.client = options.client;
   settings.credentialCache = options.credentialCache;
   settings.clientKeytab = options.clientKeytab;
-  return service.AcquireTokenByGSS(spec, *Gssapi::CreateSpnegoHandler(settings));
+  Gssapi::CreateSpnegoHandler(settings); // refuses wrong settings before the operation starts
+  return {[settings] { return Gssapi::CreateSpnegoHandler(settings); }};
 }
 
 } // namespace SsoClient::Tool

@@ -1,20 +1,18 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// Acquiring a token by a Kerberos ticket, through the system's GSSAPI where the tool is built with it.
+/// The credential of a Kerberos ticket, through the system's GSSAPI where the tool is built with it.
 
 #pragma once
 
-#include <ssoclient/saml_token.h>
-#include <ssoclient/security_token_service.h>
-#include <ssoclient/token_spec.h>
+#include <ssoclient/client/credential.h>
 
-#include <memory>
 #include <string>
 
 namespace SsoClient::Tool {
 
 struct GssOptions {
   bool isChosen = false;
+  std::string client;          ///< empty: the first principal of the cache or the keytab
   std::string service;         ///< empty: HTTP@ and the host of the token service's address
   std::string credentialCache; ///< empty: the default one, or none when there is a keytab
   std::string clientKeytab;    ///< empty: none
@@ -23,8 +21,9 @@ struct GssOptions {
 /// @throws UsageException when the tool is built without the GSSAPI.
 void RequireGss();
 
+/// The ticket is looked for when a token is acquired.
 /// @param url of the token service
-std::shared_ptr<const SamlToken> AcquireByGss(const SecurityTokenService &service, const TokenSpec &spec,
-                                              const GssOptions &options, const std::string &url);
+/// @throws Tarvel::InvalidArgumentException for a service name that is empty or lacks a part
+NegotiationCredential ToCredential(const GssOptions &options, const std::string &url);
 
 } // namespace SsoClient::Tool

@@ -3,98 +3,246 @@
 #include "interruption.h"
 
 #include "exit_code.h"
+#include "quiet_terminal.h"
 
+#include <ssoclient/client/exceptions.h>
+
+#include <atomic>
+#include <cerrno>
+#include <csignal>
+#include <ctime>
+#include <mutex>
+#include <thread>
+
+#include <poll.h>
 #include <pthread.h>
 #include <unistd.h>
 
 namespace SsoClient::Tool {
 namespace {
 
+using Clock = CallOptions::Clock;
+using std::chrono::microseconds;
+
 constexpr int ENDING_SIGNALS[] = {SIGINT, SIGTERM, SIGHUP, SIGQUIT};
 
-// What the handler restores. The handler runs only on the main thread, which blocks signals while it changes these.
-volatile std::sig_atomic_t g_isQuiet = 0;
-int g_terminal = -1;
-termios g_earlierSettings;
+/// How long a command has to end by itself.
+constexpr microseconds GRACE{20'000};
+/// How often a thread that waits for a file looks whether the file is complete.
+constexpr microseconds TURN{1'000};
 
-void RestoreTerminal() noexcept {
-  if (g_isQuiet) {
-    g_isQuiet = 0;
-    // Drops what has been typed so far: the program that next reads the terminal must not get the rest of a password.
-    tcsetattr(g_terminal, TCSAFLUSH, &g_earlierSettings);
+// Why the command ends: one of these, or the number of a signal.
+constexpr int NOTHING = 0;
+constexpr int TOO_LATE = -1;
+std::atomic<int> g_cause{NOTHING};
+
+std::mutex g_writing; // locked while a file is not complete, and for good once the command has ended
+std::mutex g_naming;  // protects the path
+std::string g_unfinishedPath;
+
+// Set before there is a second thread.
+sigset_t g_ending;   // the signals that end the process
+sigset_t g_awaited;  // these, and the one with which the main thread reports that the command has ended
+std::thread g_watch; // no thread: the command has not begun
+boost::optional<microseconds> g_timeLimit;
+boost::optional<Clock::time_point> g_deadline;
+Format g_format = Format::TEXT;
+
+/// Sent to the watching thread only. For the others, and for other processes, it is a signal without a meaning.
+int EndOfCommand() noexcept {
+  return SIGRTMIN;
+}
+
+const CancelSource &GetCancelSource() {
+  static const CancelSource source;
+  return source;
+}
+
+/// Waits for one of the signals, at most until `time`. Returns its number, or 0 when the time has come.
+int AwaitSignal(const sigset_t &set, const boost::optional<Clock::time_point> &time) noexcept {
+  for (;;) {
+    int signal = -1;
+    if (!time) {
+      signal = sigwaitinfo(&set, nullptr);
+    } else {
+      const auto left = std::chrono::ceil<std::chrono::nanoseconds>(*time - Clock::now()).count();
+      constexpr std::int64_t NANOSECONDS = 1'000'000'000;
+      const timespec patience{std::max<std::int64_t>(left, 0) / NANOSECONDS,
+                              std::max<std::int64_t>(left, 0) % NANOSECONDS};
+      signal = sigtimedwait(&set, nullptr, &patience);
+    }
+    if (signal > 0) {
+      return signal;
+    }
+    if (errno == EAGAIN) {
+      return 0;
+    }
   }
 }
 
-extern "C" void EndAtSignal(int signal) {
+/// Whether a signal that ends the process arrives in this time.
+bool IsInterruptedWithin(microseconds time) noexcept {
+  const int signal = AwaitSignal(g_awaited, Clock::now() + time);
+  return signal != 0 && signal != EndOfCommand();
+}
+
+std::string SecondsText(microseconds time) {
+  std::string fraction = std::to_string(time.count() % 1'000'000 + 1'000'000);
+  fraction.front() = '.';
+  fraction.erase(fraction.find_last_not_of('0') + 1);
+  return std::to_string(time.count() / 1'000'000) + (fraction == "." ? "" : fraction) + " s";
+}
+
+/// Does not wait: neither for a reader that does not read, nor for another thread that waits for it.
+void ReportLateness() {
+  const std::string text =
+      FailureText(DeadlineExceededException("the command did not end within " + SecondsText(g_timeLimit.value()) +
+                                            ", the limit of --timeout"),
+                  g_format);
+  pollfd error{STDERR_FILENO, POLLOUT, 0};
+  if (poll(&error, 1, 0) > 0) {
+    [[maybe_unused]] const ssize_t written = write(STDERR_FILENO, text.data(), text.size());
+  }
+}
+
+[[noreturn]] void EndEarly(int cause) {
   RestoreTerminal();
-  if (signal == SIGINT) {
+  if (cause == TOO_LATE) {
+    ReportLateness();
+    _exit(static_cast<int>(ExitCode::COMMUNICATION));
+  }
+  if (cause == SIGINT) {
     _exit(static_cast<int>(ExitCode::INTERRUPTED));
   }
-  // The handler was reset when it was called, so this ends the process as if there were no handler.
-  raise(signal);
+  std::signal(cause, SIG_DFL);
+  sigset_t all;
+  sigfillset(&all);
+  pthread_sigmask(SIG_UNBLOCK, &all, nullptr);
+  for (;;) {
+    kill(getpid(), cause);
+  }
 }
 
-sigset_t EndingAndStopping() noexcept {
+/// Waits until no file is unfinished, or a second signal has arrived; the file is then removed.
+void CompleteFile(bool isImpatient) {
+  while (!g_writing.try_lock()) {
+    if (isImpatient || IsInterruptedWithin(TURN)) {
+      g_naming.lock(); // for good: no further file is made
+      unlink(g_unfinishedPath.c_str());
+      return;
+    }
+  }
+}
+
+/// The main thread has ended the command. Returns why the process must end early nevertheless, or `NOTHING`.
+int AfterCommand() noexcept {
+  // The system reports the end of the command before signals that arrived earlier.
+  int cause = AwaitSignal(g_ending, Clock::now());
+  if (cause == 0) {
+    cause = g_cause;
+  }
+  // Another thread may still write a file.
+  while (cause == NOTHING && !g_writing.try_lock()) {
+    cause = AwaitSignal(g_ending, Clock::now() + TURN);
+  }
+  return cause;
+}
+
+void Watch() {
+  const int signal = AwaitSignal(g_awaited, g_deadline);
+  const bool hasEnded = signal == EndOfCommand();
+  const int cause = hasEnded ? AfterCommand() : signal != 0 ? signal : TOO_LATE;
+  if (cause == NOTHING) {
+    return;
+  }
+  g_cause = cause;
+  bool isImpatient = false;
+  if (!hasEnded) {
+    if (signal != 0) {
+      GetCancelSource().Cancel();
+    }
+    isImpatient = IsInterruptedWithin(GRACE);
+  }
+  CompleteFile(isImpatient);
+  EndEarly(cause);
+}
+
+sigset_t EndingSignals() {
   sigset_t set;
   sigemptyset(&set);
   for (const int signal : ENDING_SIGNALS) {
-    sigaddset(&set, signal);
+    struct sigaction current = {};
+    // A shell starts background jobs with SIGINT ignored; it must stay ignored.
+    if (sigaction(signal, nullptr, &current) == 0 && current.sa_handler != SIG_IGN) {
+      sigaddset(&set, signal);
+    }
   }
-  sigaddset(&set, SIGTSTP);
   return set;
 }
 
 } // namespace
 
-void CatchEndingSignals() {
-  for (const int signal : ENDING_SIGNALS) {
-    struct sigaction previous = {};
-    // A shell starts background jobs with SIGINT ignored; it must stay ignored.
-    if (sigaction(signal, nullptr, &previous) == 0 && previous.sa_handler != SIG_IGN) {
-      struct sigaction action = {};
-      action.sa_handler = EndAtSignal;
-      action.sa_flags = static_cast<int>(SA_RESETHAND);
-      sigaction(signal, &action, nullptr);
-    }
-  }
+void WatchCommand(const boost::optional<microseconds> &timeout, Format format) {
   // Ignored so that a file beyond the process's size limit is a write error, after which the file is cleaned up.
   std::signal(SIGXFSZ, SIG_IGN);
+  g_ending = EndingSignals();
+  g_awaited = g_ending;
+  sigaddset(&g_awaited, EndOfCommand());
+  g_timeLimit = timeout;
+  if (timeout) {
+    g_deadline = Clock::now() + *timeout;
+  }
+  g_format = format;
+  GetCancelSource(); // made here, so that a signal does not have to make it
+  sigset_t all;
+  sigset_t earlier;
+  sigfillset(&all);
+  pthread_sigmask(SIG_SETMASK, &all, &earlier);
+  g_watch = std::thread(Watch); // it inherits the mask
+  pthread_sigmask(SIG_SETMASK, &earlier, nullptr);
+  pthread_sigmask(SIG_BLOCK, &g_ending, nullptr);
 }
 
-SignalsHeldBack::SignalsHeldBack() noexcept {
-  const sigset_t held = EndingAndStopping();
-  pthread_sigmask(SIG_BLOCK, &held, &m_earlier);
+CallOptions GetCallOptions() {
+  CallOptions options;
+  options.deadline = g_deadline;
+  options.cancelToken = GetCancelSource().GetToken();
+  return options;
 }
 
-SignalsHeldBack::~SignalsHeldBack() {
-  pthread_sigmask(SIG_SETMASK, &m_earlier, nullptr);
+boost::optional<microseconds> GetTimeLimit() {
+  return g_timeLimit;
 }
 
-QuietTerminal::QuietTerminal(int descriptor) noexcept {
-  sigset_t stopping;
-  sigemptyset(&stopping);
-  sigaddset(&stopping, SIGTSTP);
-  pthread_sigmask(SIG_BLOCK, &stopping, &m_earlierMask);
-
-  const SignalsHeldBack held;
-  m_isTerminal = tcgetattr(descriptor, &g_earlierSettings) == 0;
-  if (!m_isTerminal) {
+void FinishCommand() {
+  if (!g_watch.joinable()) {
     return;
   }
-  termios quiet = g_earlierSettings;
-  quiet.c_lflag &= ~static_cast<tcflag_t>(ECHO);
-  quiet.c_lflag |= ECHONL;
-  g_terminal = descriptor;
-  g_isQuiet = 1;
-  tcsetattr(descriptor, TCSAFLUSH, &quiet);
+  pthread_kill(g_watch.native_handle(), EndOfCommand());
+  g_watch.join();
+  pthread_sigmask(SIG_UNBLOCK, &g_ending, nullptr); // they end the process as they always do
 }
 
-QuietTerminal::~QuietTerminal() {
-  {
-    const SignalsHeldBack held;
-    RestoreTerminal();
+void ReportAndFinish(const std::exception &failure, Format format) {
+  const bool isLate = Classify(failure).className == "DeadlineExceededException";
+  if (isLate && g_deadline && *g_deadline <= Clock::now()) {
+    g_cause = TOO_LATE;
   }
-  pthread_sigmask(SIG_SETMASK, &m_earlierMask, nullptr);
+  if (g_cause == NOTHING) {
+    ReportFailure(failure, format);
+  }
+  FinishCommand();
+}
+
+UnfinishedFile::UnfinishedFile(const std::function<std::string()> &create) {
+  std::unique_lock<std::mutex> writing(g_writing);
+  const std::lock_guard<std::mutex> naming(g_naming);
+  g_unfinishedPath = create();
+  writing.release();
+}
+
+UnfinishedFile::~UnfinishedFile() {
+  g_writing.unlock();
 }
 
 } // namespace SsoClient::Tool

@@ -1,48 +1,57 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// How a signal ends the tool: at once, with the terminal restored, and with no unfinished file left over.
+/// What ends a command before it is done, a signal or the limit of --timeout, and what is cleaned up then.
 
 #pragma once
 
-#include <csignal>
+#include "output.h"
 
-#include <termios.h>
+#include <ssoclient/client/call_options.h>
+
+#include <boost/optional.hpp>
+
+#include <chrono>
+#include <exception>
+#include <functional>
+#include <string>
 
 namespace SsoClient::Tool {
 
-/// From now on an interrupt (SIGINT) ends the process with `ExitCode::INTERRUPTED`, and SIGTERM, SIGHUP and SIGQUIT end
-/// it as they always do; in each case a quiet terminal echoes again first. A signal that is ignored stays ignored. Call
-/// it on the main thread, which handles all signals: the library's own threads block them.
-void CatchEndingSignals();
+/// Starts the thread that waits for signals and for the end of the time. Call it once, on the main thread, before any
+/// other thread exists. The command must end with `FinishCommand` or `ReportAndFinish`.
+///
+/// SIGINT ends the process with `ExitCode::INTERRUPTED`; SIGTERM, SIGHUP and SIGQUIT end it as they always do. A signal
+/// that is ignored stays ignored. First, the call of `GetCallOptions` is cancelled, the command has a moment to end by
+/// itself, and a file that is being written is completed. A second signal ends the process at once, and removes such a
+/// file. In each case a quiet terminal echoes again.
+/// @param timeout after which the process ends with `ExitCode::COMMUNICATION` and a message
+/// @param format of that message
+/// @throws std::system_error when no thread can be started
+void WatchCommand(const boost::optional<std::chrono::microseconds> &timeout, Format format);
 
-/// While it lives, the signals that end or stop the process are blocked; a signal that arrives takes effect afterwards.
-/// It is for short work that must not be left half done, on the main thread only.
-class SignalsHeldBack {
+/// Options of a call that ends when the command must end.
+CallOptions GetCallOptions();
+
+/// How long the command may take in all; `boost::none` if there is no limit.
+boost::optional<std::chrono::microseconds> GetTimeLimit();
+
+/// The command has ended by itself. Does not return if a signal came first, or the time is over.
+void FinishCommand();
+
+/// Reports `failure`, with which the command has ended, and does what `FinishCommand` does. A command that was
+/// interrupted reports nothing, and one that was too late reports only that.
+void ReportAndFinish(const std::exception &failure, Format format);
+
+/// A file that exists and is not yet complete, or not yet under its final name. Signals take effect afterwards.
+class UnfinishedFile {
 public:
-  SignalsHeldBack() noexcept;
-  SignalsHeldBack(const SignalsHeldBack &) = delete;
-  SignalsHeldBack &operator=(const SignalsHeldBack &) = delete;
-  ~SignalsHeldBack();
-
-private:
-  sigset_t m_earlier;
-};
-
-/// While it lives, the terminal at a descriptor (if it is a terminal) does not echo what is typed, except the end of
-/// the line. The keyboard cannot stop the process, since the shell would then make the terminal echo again. There is
-/// at most one at a time, on the main thread only.
-class QuietTerminal {
-public:
-  explicit QuietTerminal(int descriptor) noexcept;
-  QuietTerminal(const QuietTerminal &) = delete;
-  QuietTerminal &operator=(const QuietTerminal &) = delete;
-  ~QuietTerminal();
-
-  bool IsTerminal() const noexcept { return m_isTerminal; }
-
-private:
-  bool m_isTerminal;
-  sigset_t m_earlierMask;
+  /// Waits while another thread writes a file.
+  /// @param create makes the file, and returns its path, which a second signal removes
+  explicit UnfinishedFile(const std::function<std::string()> &create);
+  UnfinishedFile(const UnfinishedFile &) = delete;
+  UnfinishedFile &operator=(const UnfinishedFile &) = delete;
+  /// The file has been completed or removed.
+  ~UnfinishedFile();
 };
 
 } // namespace SsoClient::Tool

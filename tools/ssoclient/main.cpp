@@ -11,8 +11,10 @@
 #include <tarvel/crypto/system_configuration.h>
 
 #include <CLI/CLI.hpp>
+#include <boost/optional.hpp>
 
 #include <algorithm>
+#include <chrono>
 #include <exception>
 #include <map>
 #include <string>
@@ -39,31 +41,37 @@ constexpr Command COMMANDS[] = {
      "  ssoclient acquire --sts https://sts.corp.example/sts --ca ca.pem --trust sts.pem --gss\n"
      "  ssoclient acquire --sts https://sts.corp.example/sts --ca ca.pem --trust sts.pem \\\n"
      "      --gss --service HTTP/sts.corp.example@CORP.EXAMPLE --client-keytab robot.keytab\n",
-     DefineAcquire},
+     Format::TEXT, DefineAcquire},
+    {"token", "Print a fresh token; ask the service for one only when the cache has none",
+     "  ssoclient token --cache alice.cache --sts https://sts.corp.example/sts --ca ca.pem --trust sts.pem \\\n"
+     "      --user alice@corp.example --password-file password.txt\n"
+     "  ssoclient token --cache client.cache --sts https://sts.corp.example/sts --ca ca.pem --trust sts.pem \\\n"
+     "      --cert client.pem --key client.key --timeout 10 --out client.xml --force\n",
+     Format::XML, DefineToken},
     {"renew", "Ask the service for a new token to replace a renewable one",
      "  ssoclient renew --sts https://sts.corp.example/sts --ca ca.pem --trust sts.pem \\\n"
      "      --cert client.pem --key client.key --lifetime 1d --out client.xml --force client.xml\n",
-     DefineRenew},
+     Format::TEXT, DefineRenew},
     {"validate", "Ask the service whether a token is valid",
-     "  ssoclient validate --sts https://sts.corp.example/sts --ca ca.pem --trust sts.pem client.xml\n",
+     "  ssoclient validate --sts https://sts.corp.example/sts --ca ca.pem --trust sts.pem client.xml\n", Format::TEXT,
      DefineValidate},
     {"verify", "Check a token as a relying service does, and show what it says",
      "  ssoclient verify --trust sts.pem token.xml\n"
      "  ssoclient verify --trust sts.pem --explain token.xml\n"
      "  ssoclient verify --trust sts.pem --trust next-sts.pem --tolerance 60 --format json - <token.xml\n",
-     DefineVerify},
+     Format::TEXT, DefineVerify},
     {"inspect", "Show what a token says, and how it deviates from the accepted form, without verifying it",
      "  ssoclient inspect token.xml\n"
      "  ssoclient inspect --format json - <token.xml\n",
-     DefineInspect},
+     Format::TEXT, DefineInspect},
     {"doctor", "Find out why a service cannot be used, without sending it any credential",
      "  ssoclient doctor --sts https://sts.corp.example/sts --ca ca.pem --trust sts.pem\n"
      "  ssoclient doctor --sts https://sts.corp.example/sts --ca ca.pem --timeout 5 --format json\n",
-     DefineDoctor},
+     Format::TEXT, DefineDoctor},
     {"dialect", "List the known dialects of services, or write one as JSON that can be edited",
      "  ssoclient dialect --format json\n"
      "  ssoclient dialect cxf >partner.json; ssoclient dialect partner.json\n",
-     DefineDialect},
+     Format::TEXT, DefineDialect},
 };
 
 /// The format that the command line asks for; works also for a command line that has errors.
@@ -136,7 +144,8 @@ std::string Explain(const CLI::App &app, const CLI::ParseError &error) {
   return message;
 }
 
-void AddOutputOptions(CLI::App &app, OutputOptions &output) {
+void AddCommonOptions(CLI::App &app, Format format, OutputOptions &output,
+                      boost::optional<std::chrono::microseconds> &timeout) {
   static const std::map<std::string, Format> FORMATS = {
       {"text", Format::TEXT}, {"json", Format::JSON}, {"xml", Format::XML}};
   app.add_option_function<std::string>(
@@ -144,8 +153,13 @@ void AddOutputOptions(CLI::App &app, OutputOptions &output) {
          "Format of the result; xml is the token itself")
       ->check(RefuseEmpty)
       ->check(CLI::IsMember({"text", "json", "xml"}))
-      ->default_str("text")
+      ->default_str(format == Format::XML ? "xml" : "text")
       ->type_name("FORMAT");
+  AddOption(
+      app, "--timeout", timeout,
+      "How long the command may take, such as 2.5; then it ends with exit code 4. By default, it may take any time; "
+      "a request may take four minutes")
+      .TypeName("SECONDS");
   AddFlag(app, "-v,--verbose", output.verbose,
           "Write log lines, and the requests and responses without their content, to standard error; and warnings even "
           "when the format is json");
@@ -159,13 +173,20 @@ int Run(int argc, char **argv) {
   app.require_subcommand(1);
 
   OutputOptions output;
+  boost::optional<std::chrono::microseconds> timeout;
   bool usesSystemCrypto = false;
   Action chosen;
   for (const Command &command : COMMANDS) {
     CLI::App *sub = app.add_subcommand(command.name, command.summary);
     sub->footer(std::string("Examples:\n") + command.examples);
-    sub->final_callback([&chosen, action = command.define(*sub, output)] { chosen = action; });
-    AddOutputOptions(*sub, output);
+    const Action action = command.define(*sub, output);
+    AddCommonOptions(*sub, command.format, output, timeout);
+    sub->final_callback([&chosen, &output, action, sub, format = command.format] {
+      chosen = action;
+      if (sub->count("--format") == 0) {
+        output.format = format;
+      }
+    });
     sub->add_flag("--system-crypto", usesSystemCrypto,
                   "Use OpenSSL as this machine configures it, with its providers (FIPS, PKCS#11) and TLS settings");
   }
@@ -177,6 +198,7 @@ int Run(int argc, char **argv) {
   } catch (const CLI::ParseError &error) {
     throw UsageException(Explain(app, error) + "; see ssoclient --help");
   }
+  WatchCommand(timeout, output.format);
   if (output.verbose) {
     ShowLibraryLog();
   }
@@ -193,10 +215,11 @@ int main(int argc, char **argv) {
   using namespace SsoClient::Tool;
   try {
     KeepStandardStreamsApart();
-    CatchEndingSignals();
-    return Run(argc, argv);
+    const int exitCode = Run(argc, argv);
+    FinishCommand();
+    return exitCode;
   } catch (const std::exception &failure) {
-    ReportFailure(failure, RequestedFormat(argc, argv));
+    ReportAndFinish(failure, RequestedFormat(argc, argv));
     return static_cast<int>(Classify(failure).code);
   }
 }

@@ -9,10 +9,9 @@ void RequireGss() {
   throw UsageException("--gss is not available: this ssoclient is built without the GSSAPI");
 }
 
-std::shared_ptr<const SamlToken> AcquireByGss(const SecurityTokenService & /*service*/, const TokenSpec & /*spec*/,
-                                              const GssOptions & /*options*/, const std::string & /*url*/) {
+NegotiationCredential ToCredential(const GssOptions & /*options*/, const std::string & /*url*/) {
   RequireGss();
-  return nullptr;
+  return {};
 }
 
 } // namespace SsoClient::Tool

@@ -10,6 +10,11 @@
 namespace SsoClient::Tool {
 namespace {
 
+using std::chrono::microseconds;
+
+constexpr const char *DIGITS = "0123456789";
+constexpr std::int64_t MAX_SECONDS = 24 * 60 * 60;
+
 /// Replaces the decimal number in `argument` with its shortest form. Returns what is wrong with it, or an empty text.
 std::string NormaliseNumber(std::string &argument) {
   if (argument.empty()) {
@@ -31,6 +36,28 @@ std::string NormaliseNumber(std::string &argument) {
 /// Accepts the "true" that the parser stores for a flag, and refuses any other text that follows the flag after "=".
 std::string RefuseArgument(const std::string &argument) {
   return argument == "true" ? "" : "takes no argument";
+}
+
+/// The time in `text`, a decimal number of seconds; `boost::none` for any other text and for a time out of range.
+boost::optional<microseconds> ParseSeconds(const std::string &text) {
+  const std::size_t whole = text.find_first_not_of(DIGITS);
+  const bool hasFraction = whole != std::string::npos && text[whole] == '.';
+  const std::string fraction = hasFraction ? text.substr(whole + 1) : "";
+  const bool isNumber = hasFraction ? !fraction.empty() && fraction.find_first_not_of(DIGITS) == std::string::npos
+                                    : whole == std::string::npos;
+  if (text.empty() || whole == 0 || !isNumber) {
+    return boost::none;
+  }
+  std::int64_t seconds = 0;
+  if (std::from_chars(text.data(), text.data() + text.size(), seconds).ec != std::errc()) {
+    return boost::none;
+  }
+  const std::int64_t parts = std::stoll((fraction + "000000").substr(0, 6));
+  const bool isMore = seconds == MAX_SECONDS && (parts > 0 || fraction.find_first_not_of('0') != std::string::npos);
+  if (seconds > MAX_SECONDS || isMore || (seconds == 0 && parts < 1'000)) {
+    return boost::none;
+  }
+  return std::chrono::seconds(seconds) + microseconds(parts);
 }
 
 Option AddNumber(CLI::Option &option) {
@@ -101,6 +128,19 @@ Option AddOption(CLI::App &command, const std::string &name, int &value, const s
 
 Option AddOption(CLI::App &command, const std::string &name, std::int64_t &value, const std::string &help) {
   return AddNumber(*command.add_option(name, value, help));
+}
+
+Option AddOption(CLI::App &command, const std::string &name, boost::optional<microseconds> &value,
+                 const std::string &help) {
+  const auto take = [&value](const CLI::results_t &arguments) {
+    value = ParseSeconds(arguments.front());
+    return true;
+  };
+  CLI::Option *const option = command.add_option(name, take, help);
+  option->expected(1)->check(RefuseEmpty)->check([](const std::string &argument) -> std::string {
+    return ParseSeconds(argument) ? "" : "must be a number of seconds from 0.001 to " + std::to_string(MAX_SECONDS);
+  });
+  return Option(*option);
 }
 
 Option AddOption(CLI::App &command, const std::string &name, std::vector<std::string> &values,

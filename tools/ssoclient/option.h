@@ -5,6 +5,9 @@
 
 #pragma once
 
+#include <boost/optional.hpp>
+
+#include <chrono>
 #include <cstdint>
 #include <string>
 #include <vector>
@@ -53,6 +56,9 @@ std::string RefuseEmpty(const std::string &argument);
 Option AddOption(CLI::App &command, const std::string &name, std::string &value, const std::string &help);
 Option AddOption(CLI::App &command, const std::string &name, int &value, const std::string &help);
 Option AddOption(CLI::App &command, const std::string &name, std::int64_t &value, const std::string &help);
+/// The same for a time in seconds, a decimal number such as 2.5, from 0.001 to 86400 (a day).
+Option AddOption(CLI::App &command, const std::string &name, boost::optional<std::chrono::microseconds> &value,
+                 const std::string &help);
 /// The same for an option that may be given more than once, with one argument each time.
 Option AddOption(CLI::App &command, const std::string &name, std::vector<std::string> &values, const std::string &help);
 

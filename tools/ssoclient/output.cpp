@@ -93,23 +93,25 @@ void ShowLibraryLog() {
       [](const Tarvel::Service::LogRecord &record) { WriteLine("log: " + std::string(record.message)); });
 }
 
-void ReportFailure(const std::exception &failure, Format format) {
+std::string FailureText(const std::exception &failure, Format format) {
   const Failure known = Classify(failure);
   const auto *const hinted = dynamic_cast<const HintedException *>(&failure);
-  std::string lines;
   if (format == Format::JSON) {
     nlohmann::ordered_json json = {{"schema", 1}, {"error", {{"class", known.className}, {"message", failure.what()}}}};
     if (hinted) {
       json["error"]["hint"] = hinted->GetHint();
     }
-    lines = Json(json) + "\n";
-  } else {
-    lines = "ssoclient: " + std::string(known.label) + ": " + PrintableValue(failure.what()) + "\n";
-    if (hinted) {
-      lines += "ssoclient: hint: " + PrintableValue(hinted->GetHint()) + "\n";
-    }
+    return Json(json) + "\n";
   }
-  std::fputs(lines.c_str(), stderr);
+  std::string lines = "ssoclient: " + std::string(known.label) + ": " + PrintableValue(failure.what()) + "\n";
+  if (hinted) {
+    lines += "ssoclient: hint: " + PrintableValue(hinted->GetHint()) + "\n";
+  }
+  return lines;
+}
+
+void ReportFailure(const std::exception &failure, Format format) {
+  std::fputs(FailureText(failure, format).c_str(), stderr);
 }
 
 } // namespace SsoClient::Tool

@@ -53,7 +53,10 @@ void Note(std::string_view message, const OutputOptions &output);
 /// From now on each line that the library logs is written to standard error.
 void ShowLibraryLog();
 
-/// Reports `failure` on standard error: in JSON as one line, otherwise as one line of text and a second one for a hint.
+/// The report of `failure`: in JSON one line, otherwise one line of text and a second one for a hint.
+std::string FailureText(const std::exception &failure, Format format);
+
+/// Writes that report to standard error.
 void ReportFailure(const std::exception &failure, Format format);
 
 } // namespace SsoClient::Tool

@@ -11,12 +11,13 @@
 #include <ssoclient/service_options.h>
 
 #include <exception>
+#include <memory>
 #include <string>
 
 namespace SsoClient::Tool {
 
-/// Saves a refused token in the file of --save-refused, and adds a hint to the failure. The object must outlive the
-/// service that uses its sink. Main thread only.
+/// Saves a refused token in the file of --save-refused, and adds a hint to the failure. The client may call the sink on
+/// any thread, also after this object has been destroyed.
 class RefusedToken {
 public:
   /// @param trusted the certificates with which tokens are verified
@@ -26,12 +27,9 @@ public:
   RefusedToken(const RefusedToken &) = delete;
   RefusedToken &operator=(const RefusedToken &) = delete;
 
-  /// A function that calls `Keep`.
-  ServiceOptions::RefusedTokenSink GetSink();
-
-  /// Saves the token, if there is a file for it, and reports where it is. If it cannot be saved, there is only a
-  /// warning, because the failure that follows is more important.
-  void Keep(const std::string &xml);
+  /// A function that saves a token, if there is a file for it, and reports where it is. If it cannot be saved, there is
+  /// only a warning, because the failure that follows is more important.
+  ServiceOptions::RefusedTokenSink GetSink() const;
 
   /// Returns what `call` returns.
   /// @throws HintedException when `call` fails after a token was refused. Everything else that `call` throws is thrown
@@ -43,22 +41,21 @@ public:
     } catch (const HintedException &) {
       throw;
     } catch (const std::exception &failure) {
-      if (m_hint.empty()) {
+      const std::string hint = GetHint();
+      if (hint.empty()) {
         throw;
       }
-      throw HintedException(failure, m_hint);
+      throw HintedException(failure, hint);
     }
   }
 
 private:
-  /// Saves the token, and returns a hint: where the token is, and what to do next.
-  std::string Save(const std::string &xml);
+  class Keeper;
 
-  const TokenOutputOptions &m_options;
-  const Tarvel::Crypto::CertificateList &m_trusted;
-  const VerifyOptions &m_verifyOptions;
-  const OutputOptions &m_output;
-  std::string m_hint; ///< empty: no token was refused
+  /// What to do about the token that was refused; empty if none was.
+  std::string GetHint() const;
+
+  std::shared_ptr<Keeper> m_keeper; // shared with the sink
 };
 
 } // namespace SsoClient::Tool

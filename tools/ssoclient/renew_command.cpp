@@ -6,6 +6,7 @@
 #include "connection.h"
 #include "dialect_options.h"
 #include "identity.h"
+#include "interruption.h"
 #include "operation_events.h"
 #include "refused_token.h"
 #include "service_call.h"
@@ -50,10 +51,10 @@ ExitCode Renew(const RenewOptions &options, const OutputOptions &output) {
   serviceOptions.verifyOptions.profile = verifyOptions.profile; // the tolerance is checked below
   serviceOptions.observer = ObserverFor(output);
   serviceOptions.refusedTokenSink = refused.GetSink();
-  const auto service = CreateService(options.connection, trusted, LoadIdentity(options.identity), serviceOptions);
+  const auto client = CreateClient(options.connection, trusted, LoadIdentity(options.identity), serviceOptions);
   const IssuedToken issued = refused.Explain([&] {
     IssuedToken renewed =
-        AskForToken([&] { return service->RenewToken(*given, spec.tokenLifetimeSec); }, nullptr, output);
+        AskForToken([&] { return client->Renew(given, spec.tokenLifetimeSec, GetCallOptions()); }, nullptr, output);
     RequireWithinTolerance(*renewed.token, trusted, verifyOptions, refused.GetSink());
     return renewed;
   });

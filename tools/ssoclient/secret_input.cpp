@@ -3,8 +3,8 @@
 #include "secret_input.h"
 
 #include "exit_code.h"
-#include "interruption.h"
 #include "output.h"
+#include "quiet_terminal.h"
 
 #include <tarvel/core/exception.h>
 #include <tarvel/core/string_util.h>

@@ -26,24 +26,33 @@ bool SaysNoCanonicalForm(const Tarvel::Xml::Security::XmlSecurityException &fail
   return BeginsWith(failure, "No canonical form: ");
 }
 
-IssuedToken AskForToken(const std::function<std::shared_ptr<const SamlToken>()> &call, const Doubt *doubt,
-                        const OutputOptions &output) {
+void WarnOf(const Doubt *doubt, const OutputOptions &output) {
   if (doubt) {
     Warn(doubt->warning, output);
   }
-  const Tarvel::System::DateTime askedAt = Tarvel::System::GetUtcDateTime();
+}
+
+IssuedToken ExplainDoubt(const std::function<IssuedToken()> &call, const Doubt *const &doubt) {
   try {
-    const std::shared_ptr<const SamlToken> token = CallService(call);
-    if (!token) {
-      throw SsoException("The response holds no token");
-    }
-    return {token, askedAt};
+    return CallService(call);
   } catch (const SsoException &failure) {
     if (doubt && IsRefusal(failure)) {
       throw HintedException(failure, doubt->hint);
     }
     throw;
   }
+}
+
+IssuedToken AskForToken(const std::function<std::shared_ptr<const SamlToken>()> &call, const Doubt *doubt,
+                        const OutputOptions &output) {
+  WarnOf(doubt, output);
+  const Tarvel::System::DateTime askedAt = Tarvel::System::GetUtcDateTime();
+  const auto ask = [&]() -> IssuedToken { return {call(), askedAt}; };
+  IssuedToken issued = ExplainDoubt(ask, doubt);
+  if (!issued.token) {
+    throw SsoException("The response holds no token");
+  }
+  return issued;
 }
 
 } // namespace SsoClient::Tool

@@ -12,6 +12,8 @@
 #include <tarvel/xml/parser.h>
 #include <tarvel/xml/security/exceptions.h>
 
+#include <boost/optional.hpp>
+
 #include <functional>
 #include <memory>
 
@@ -47,8 +49,17 @@ struct Doubt {
 
 struct IssuedToken {
   std::shared_ptr<const SamlToken> token;
-  Tarvel::System::DateTime askedAt; ///< by this machine's clock
+  /// By this machine's clock; `boost::none` for a token that was not issued for this command.
+  boost::optional<Tarvel::System::DateTime> askedAt;
 };
+
+/// Warns of a doubt, unless it is null.
+void WarnOf(const Doubt *doubt, const OutputOptions &output);
+
+/// The token that `call` gets. `call` asks the service and does nothing else.
+/// @param doubt null when there is none; `call` may set it
+/// @throws HintedException when the service refuses a doubtful request. Also throws what `CallService` throws.
+IssuedToken ExplainDoubt(const std::function<IssuedToken()> &call, const Doubt *const &doubt);
 
 /// The token that `call` gets from the service; never null.
 /// @param doubt null when there is none

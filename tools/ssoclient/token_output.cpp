@@ -62,9 +62,11 @@ void CheckTokenOutput(const TokenOutputOptions &options, const OutputOptions &ou
 void WriteToken(const IssuedToken &issued, const TokenSpec &spec, const ServiceDialect &dialect,
                 std::int64_t toleranceSec, const TokenOutputOptions &options, const OutputOptions &output) {
   TokenView view = ViewOf(*issued.token);
-  view.unmet = FindUnmet(spec, dialect, issued.askedAt, *view.facts, toleranceSec);
-  for (const UnmetRequest &request : *view.unmet) {
-    Warn("asked for, but not given by the service: " + request.wanted);
+  if (issued.askedAt) {
+    view.unmet = FindUnmet(spec, dialect, *issued.askedAt, *view.facts, toleranceSec);
+    for (const UnmetRequest &request : *view.unmet) {
+      Warn("asked for, but not given by the service: " + request.wanted);
+    }
   }
 
   if (options.file == STANDARD_OUTPUT) {

@@ -31,7 +31,7 @@ void AddTokenOutputOptions(CLI::App &app, TokenOutputOptions &options);
 /// @throws UsageException, Tarvel::IOException
 void CheckTokenOutput(const TokenOutputOptions &options, const OutputOptions &output);
 
-/// Warns of what `spec` asks for and the token does not have. With a file, writes the token's XML to it, and then,
+/// Warns of what `spec` asks for and a token that was issued now does not have. With a file, writes the token's XML to it, and then,
 /// unless the format is XML, the report to standard output. If the file is "-", writes only the XML to standard output;
 /// without a file, only the report.
 /// @param dialect of the request

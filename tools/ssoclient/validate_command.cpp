@@ -5,6 +5,7 @@
 #include "command.h"
 #include "connection.h"
 #include "dialect_options.h"
+#include "interruption.h"
 #include "operation_events.h"
 #include "service_call.h"
 #include "trust.h"
@@ -40,8 +41,8 @@ ExitCode Validate(const ValidateOptions &options, const OutputOptions &output) {
 
   const Tarvel::Crypto::CertificateList trusted = LoadTrusted(options.trust, output);
   const auto token = ReadToken(options.file, trusted, VerifyOptionsOf(options.trust));
-  const auto service = CreateService(options.connection, trusted, boost::none, serviceOptions);
-  const bool isValid = CallService([&] { return service->ValidateSubject(*token); });
+  const auto client = CreateClient(options.connection, trusted, boost::none, serviceOptions);
+  const bool isValid = CallService([&] { return client->Validate(token, GetCallOptions()); });
   WriteOutput(RenderVerdict(isValid, output.format));
   return isValid ? ExitCode::DONE : ExitCode::TOKEN_INVALID;
 }

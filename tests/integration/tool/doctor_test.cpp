@@ -343,7 +343,7 @@ TEST(DoctorUsage, RefusesWhatTheOtherCommandsRefuse) {
   ExpectResult(RunTool({"doctor", "--sts", "https://localhost/", "--format", "xml"}), 2, "",
                "ssoclient: usage: a diagnosis has no XML form; give --format text or json\n");
   ExpectResult(RunTool({"doctor", "--sts", "https://localhost/", "--timeout", "0"}), 2, "",
-               "ssoclient: usage: --timeout: must be a number from 1 to 3600; see ssoclient --help\n");
+               "ssoclient: usage: --timeout: must be a number of seconds from 0.001 to 86400; see ssoclient --help\n");
   ExpectResult(RunTool({"doctor", "--sts", "https://localhost/", "--ca", "missing.pem"}), 7, "",
                "ssoclient: file: Cannot open missing.pem: No such file or directory\n");
 }

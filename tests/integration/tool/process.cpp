@@ -126,11 +126,12 @@ void Finish(const Process &process, Result &result) {
   result.exitCode = WIFEXITED(status) ? WEXITSTATUS(status) : 128 + WTERMSIG(status);
 }
 
-/// Whether process `id` has a handler for `signal`.
-bool Catches(pid_t id, int signal) {
+} // namespace
+
+bool Blocks(pid_t id, int signal) {
   std::ifstream status("/proc/" + std::to_string(id) + "/status");
   for (std::string word; status >> word;) {
-    if (word == "SigCgt:") {
+    if (word == "SigBlk:") {
       std::uint64_t mask = 0;
       status >> std::hex >> mask;
       return ((mask >> (signal - 1)) & 1u) != 0;
@@ -138,8 +139,6 @@ bool Catches(pid_t id, int signal) {
   }
   return false;
 }
-
-} // namespace
 
 void ResetSignals() {
   for (const int signal : {SIGINT, SIGQUIT, SIGPIPE, SIGHUP, SIGTERM}) {
@@ -180,10 +179,10 @@ Result RunToolAndSignal(const std::vector<std::string> &arguments, int signal) {
   Process process;
   Result result;
   Start(process, ToolCommand(arguments), Testing::DataPath("tokens"));
-  // No event reports that a process has begun to catch a signal, so this reads the state of the process repeatedly.
-  while (!Catches(process.id, signal)) {
+  // No event reports that a process has begun to wait for a signal, so this reads the state of the process repeatedly.
+  while (!Blocks(process.id, signal)) {
     if (waitpid(process.id, nullptr, WNOHANG) != 0) {
-      throw std::runtime_error("the tool ended before it caught the signal");
+      throw std::runtime_error("the tool ended before it waited for the signal");
     }
     usleep(1000);
   }

@@ -9,6 +9,8 @@
 #include <string>
 #include <vector>
 
+#include <sys/types.h>
+
 namespace ToolTest {
 
 struct Result {
@@ -20,6 +22,9 @@ struct Result {
 /// Resets signals to what they do in a shell's foreground. Called in a new process before it executes another program,
 /// since a program inherits which signals its parent ignores: a shell ignores some for background jobs.
 void ResetSignals();
+
+/// Whether the main thread of process `id` leaves `signal` to another thread.
+bool Blocks(pid_t id, int signal);
 
 /// The words that start the tool with `arguments`.
 std::vector<std::string> ToolCommand(const std::vector<std::string> &arguments);
@@ -33,7 +38,7 @@ Result RunTool(const std::vector<std::string> &arguments, const std::string &inp
 /// Runs `ShellCommand(commandLine)` in `folder`.
 Result RunShell(const std::string &commandLine, const std::string &folder = Testing::DataPath("tokens"));
 
-/// Starts the tool with a standard input that stays open and silent, sends it `signal` as soon as it catches that
+/// Starts the tool with a standard input that stays open and silent, sends it `signal` as soon as it waits for that
 /// signal, and returns how it ended.
 Result RunToolAndSignal(const std::vector<std::string> &arguments, int signal);
 

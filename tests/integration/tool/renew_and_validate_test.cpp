@@ -143,9 +143,9 @@ TEST_F(Validate, ReportsAStandardStreamThatIsClosed) {
 TEST_F(Validate, ShowsTheLibrarysLogWithoutATokenInIt) {
   const Result result = Run("ssoclient validate -v " + Service() + "token.xml");
   EXPECT_EQ("valid\n", result.out);
-  EXPECT_THAT(result.err, HasSubstr(" START operation SecurityTokenServiceImpl::ValidateSubject\n"));
+  EXPECT_THAT(result.err, HasSubstr(" START operation TokenClient::ValidateSubject\n"));
   EXPECT_THAT(result.err, HasSubstr("\nssoclient: log: Result: true\n"));
-  EXPECT_THAT(result.err, HasSubstr(" END operation SecurityTokenServiceImpl::ValidateSubject\n"));
+  EXPECT_THAT(result.err, HasSubstr(" END operation TokenClient::ValidateSubject\n"));
   EXPECT_THAT(result.err, testing::Not(HasSubstr("saml:")));
 }
 

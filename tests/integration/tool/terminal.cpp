@@ -54,6 +54,15 @@ TerminalSession::~TerminalSession() {
   close(m_slave);
 }
 
+void TerminalSession::WaitUntilItBlocks(int signal) const {
+  for (int waited = 0; !Blocks(m_process, signal); waited += TURN_MS) {
+    if (waited >= PATIENCE_MS) {
+      throw std::runtime_error("the process does not block the signal");
+    }
+    usleep(TURN_MS * 1000);
+  }
+}
+
 bool TerminalSession::ReadSome(int timeoutMs) {
   pollfd polled{m_master, POLLIN, 0};
   if (poll(&polled, 1, timeoutMs) <= 0) {

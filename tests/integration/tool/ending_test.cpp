@@ -1,0 +1,152 @@
+// SPDX-License-Identifier: Apache-2.0
+// Each command ends at a signal and at the limit of --timeout, wherever it waits, and leaves nothing behind.
+
+#include "expect_result.h"
+#include "service_test.h"
+#include "terminal.h"
+
+#include <gmock/gmock.h>
+#include <gtest/gtest.h>
+
+#include <csignal>
+#include <set>
+#include <string>
+#include <tuple>
+
+namespace ToolTest {
+namespace {
+
+using testing::HasSubstr;
+
+constexpr const char *LATE = "ssoclient: timed out: the command did not end within 0.3 s, the limit of --timeout\n";
+
+/// The commands that wait for the service, each with the options that it needs.
+constexpr const char *SERVICE_COMMANDS[] = {
+    "acquire --user alice@corp.example --password-file password.txt --out token.xml",
+    "acquire --cert client.pem --key client.key --out token.xml",
+    "acquire --cert client.pem --key client.key --token given.xml --out token.xml",
+    "token --cache alice.cache --user alice@corp.example --password-file password.txt --out token.xml",
+    "renew --cert client.pem --key client.key --out token.xml given.xml",
+    "validate given.xml"};
+
+/// The commands that wait for a file that nobody writes.
+constexpr const char *FILE_COMMANDS[] = {"inspect fifo", "verify --trust sts.pem fifo",
+                                         "verify --trust sts.pem --explain fifo", "verify --trust fifo given.xml"};
+
+class Ending : public ServiceTest {
+protected:
+  Ending() {
+    Acquire("given.xml", std::string(IDENTITY) + "--renewable");
+    Run("mkfifo fifo");
+    m_before = m_folder.Names();
+  }
+
+  /// The command line with the service that never answers.
+  std::string Stalled(const std::string &command) const { return "ssoclient " + command + " " + Service("stall"); }
+
+  /// Expects that there is no file but those of before, and a cache without a token if the command has one.
+  void ExpectNothingLeft(const std::string &command) const {
+    std::set<std::string> expected = m_before;
+    if (command.find("--cache") != std::string::npos) {
+      expected.insert("alice.cache");
+      EXPECT_EQ("", m_folder.Read("alice.cache"));
+    }
+    EXPECT_EQ(expected, m_folder.Names());
+  }
+
+  std::set<std::string> m_before;
+};
+
+class OfServiceCommand : public Ending, public testing::WithParamInterface<std::tuple<const char *, int>> {};
+
+TEST_P(OfServiceCommand, ComesAtASignalWhileTheServiceDoesNotAnswer) {
+  const auto [command, signal] = GetParam();
+  TerminalSession session(ShellCommand("exec " + Stalled(command)), m_folder.Path());
+  AwaitLog("/sts/fault/stall: fault");
+  session.Signal(signal);
+  EXPECT_EQ(128 + signal, session.Finish());
+  EXPECT_EQ("", session.Shown());
+  ExpectNothingLeft(command);
+}
+
+INSTANTIATE_TEST_SUITE_P(Each, OfServiceCommand,
+                         testing::Combine(testing::ValuesIn(SERVICE_COMMANDS), testing::Values(SIGINT, SIGTERM)));
+
+class LateServiceCommand : public Ending, public testing::WithParamInterface<const char *> {};
+
+TEST_P(LateServiceCommand, EndsInTime) {
+  ExpectResult(Run(Stalled(GetParam()) + "--timeout 0.3"), 4, "", LATE);
+  ExpectNothingLeft(GetParam());
+}
+
+TEST_P(LateServiceCommand, EndsInTimeWithAnObjectInJson) {
+  ExpectResult(Run(Stalled(GetParam()) + "--timeout 0.3 --format json"), 4, "",
+               R"({"schema":1,"error":{"class":"DeadlineExceededException","message":)"
+               R"("the command did not end within 0.3 s, the limit of --timeout"}})"
+               "\n");
+}
+
+INSTANTIATE_TEST_SUITE_P(Each, LateServiceCommand, testing::ValuesIn(SERVICE_COMMANDS));
+
+class LateFileCommand : public Ending, public testing::WithParamInterface<const char *> {};
+
+TEST_P(LateFileCommand, EndsInTime) {
+  ExpectResult(Run(std::string("ssoclient ") + GetParam() + " --timeout 0.3"), 4, "", LATE);
+}
+
+TEST_P(LateFileCommand, EndsAtASignal) {
+  for (const int signal : {SIGINT, SIGTERM}) {
+    TerminalSession session(ShellCommand("exec ssoclient " + std::string(GetParam())), m_folder.Path());
+    session.WaitUntilItBlocks(signal);
+    session.Signal(signal);
+    EXPECT_EQ(128 + signal, session.Finish());
+    EXPECT_EQ("", session.Shown());
+  }
+}
+
+INSTANTIATE_TEST_SUITE_P(Each, LateFileCommand, testing::ValuesIn(FILE_COMMANDS));
+
+TEST_F(Ending, ComesInTimeAtThePromptAndTheTerminalEchoesAgain) {
+  for (const char *command : {"acquire ", "token --cache alice.cache "}) {
+    TerminalSession session(
+        ShellCommand("exec ssoclient " + (command + Service()) + "--user alice@corp.example --timeout 0.5"),
+        m_folder.Path());
+    session.WaitFor("Password for alice@corp.example: ");
+    EXPECT_FALSE(session.Echoes());
+    EXPECT_EQ(4, session.Finish());
+    EXPECT_TRUE(session.Echoes());
+    EXPECT_EQ("Password for alice@corp.example: ssoclient: timed out: the command did not end within 0.5 s, the limit "
+              "of --timeout\r\n",
+              session.Shown());
+  }
+}
+
+TEST_F(Ending, OfTheDoctorComesInTimeWithWhatItHasFound) {
+  const Result result = Run("ssoclient doctor " + Service("stall") + "--timeout 1");
+  EXPECT_EQ(4, result.exitCode);
+  EXPECT_EQ("", result.err);
+  EXPECT_THAT(result.out, HasSubstr("\nhttp          failed    "));
+  EXPECT_THAT(result.out, HasSubstr("\ncertificates  fine      "));
+}
+
+TEST_F(Ending, OfTheDoctorComesInTimeWhileItReadsAFile) {
+  ExpectResult(Run("ssoclient doctor --sts https://127.0.0.1:9/ --ca fifo --timeout 0.3"), 4, "", LATE);
+}
+
+TEST_F(Ending, AtATimeOutOfRangeIsRefused) {
+  for (const char *timeout : {"0", "0.0009", "86400.001", "1e3", "-1", "5.", ".5", "1 ", "99999999999999999999"}) {
+    ExpectResult(
+        Run("ssoclient inspect --timeout '" + std::string(timeout) + "' given.xml"), 2, "",
+        "ssoclient: usage: --timeout: must be a number of seconds from 0.001 to 86400; see ssoclient --help\n");
+  }
+}
+
+TEST_F(Ending, OfACommandThatIsInTimeIsTheUsualOne) {
+  for (const char *timeout : {"60", "60.5", "86400"}) {
+    ExpectResult(Run("ssoclient validate --timeout " + std::string(timeout) + " " + Service() + "given.xml"), 0,
+                 "valid\n", "");
+  }
+}
+
+} // namespace
+} // namespace ToolTest

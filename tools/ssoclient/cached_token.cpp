@@ -1,0 +1,105 @@
+// SPDX-License-Identifier: Apache-2.0
+
+#include "cached_token.h"
+
+#include "interruption.h"
+#include "issue_watch.h"
+#include "task_queue.h"
+
+#include <tarvel/core/exception.h>
+#include <tarvel/io/private_file.h>
+
+#include <future>
+#include <utility>
+
+#include <sys/stat.h>
+#include <unistd.h>
+
+namespace SsoClient::Tool {
+namespace {
+
+/// Has the main thread ask for the credential.
+Credential AskMainThread(TaskQueue &tasks, const std::function<Credential()> &credential) {
+  auto task = std::make_shared<std::packaged_task<Credential()>>(credential);
+  std::future<Credential> result = task->get_future();
+  tasks.Post([task = std::move(task)] { (*task)(); });
+  return result.get(); // throws if the task was discarded
+}
+
+std::shared_ptr<const SamlToken> Get(const TokenSource &source, const std::shared_ptr<TaskQueue> &tasks) {
+  const CallOptions callOptions = GetCallOptions();
+  GetOptions options;
+  options.deadline = callOptions.deadline;
+  options.cancelToken = callOptions.cancelToken;
+  options.executor = [tasks](std::function<void()> function) { tasks->Post(std::move(function)); };
+  boost::optional<TokenOutcome> result;
+  bool isDone = false;
+  source.GetAsync(options, [&result, &isDone](const TokenOutcome &outcome) {
+    result = outcome;
+    isDone = true;
+  });
+  tasks->RunUntil(isDone);
+  return result->Get();
+}
+
+/// The library may still write the file of a call that was cancelled. Waits for that, so that nothing is left over.
+void AwaitCacheFile(const std::string &path) {
+  constexpr int PATIENCE = 1000;
+  constexpr useconds_t TURN_MICROSECONDS = 1000;
+  const std::string replacement = path + ".new"; // see `Tarvel::PrivateFileLock::Replace`
+  const UnfinishedFile unfinished([&replacement] { return replacement; });
+  const auto exists = [&replacement] {
+    struct stat status = {};
+    return lstat(replacement.c_str(), &status) == 0;
+  };
+  for (int turn = 0; turn < PATIENCE && exists() && !Tarvel::PrivateFile(path).TryLock(); ++turn) {
+    usleep(TURN_MICROSECONDS);
+  }
+}
+
+IssuedToken GetFrom(const TokenSource &source, const CachedTokenCall &call, const std::shared_ptr<TaskQueue> &tasks) {
+  std::shared_ptr<const SamlToken> token = Get(source, tasks);
+  if (!call.watch->GetAskedAt() && !call.isAccepted(*token)) {
+    source.Invalidate(token->GetId());
+    token = Get(source, tasks);
+  }
+  return {token, call.watch->GetAskedAt()};
+}
+
+/// The library returns an issued token even if the file cannot be written.
+void WarnUnlessKept(const std::string &path, const SamlToken &token) {
+  boost::optional<std::string> content;
+  try {
+    content = Tarvel::PrivateFile(path).Read();
+  } catch (const Tarvel::IOException &) { // the content stays empty
+  }
+  if (!content || content->find(token.GetId()) == std::string::npos) {
+    Warn("the token could not be written to " + path + "; -v shows why");
+  }
+}
+
+} // namespace
+
+IssuedToken GetCachedToken(const CachedTokenCall &call) {
+  const auto tasks = std::make_shared<TaskQueue>();
+  const auto provider = [tasks, credential = call.credential] { return AskMainThread(*tasks, credential); };
+  TokenSourceOptions options;
+  options.cache = call.cache;
+  try {
+    const TokenSource source(call.client, provider, call.spec, options);
+    IssuedToken issued = GetFrom(source, call, tasks);
+    tasks->Close();
+    if (issued.askedAt) {
+      WarnUnlessKept(call.cache.path, *issued.token);
+    }
+    return issued;
+  } catch (...) {
+    tasks->Close();
+    if (call.watch->GetAskedAt()) {
+      AwaitCacheFile(call.cache.path);
+    }
+    throw;
+  }
+}
+
+} // namespace SsoClient::Tool
