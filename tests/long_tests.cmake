@@ -18,5 +18,8 @@ ssoclient_mark(20 in_full
   PositionOfRefusal.IsAfterTextThatAWellFormedDocumentMayBeginWith
   DocumentBetweenGuardPages.IsReadAsElsewhere
   OneServiceOnSixteenThreadsOverTls.RunsTwentyThousandOperationsWithoutErrorOrGrowth
+  Over/ManyAcquisitions.AreUnderWayAtOnceOnFewThreadsInLittleMemoryAndAllAreRight/Tls
+  Over/ManyAcquisitions.AllEndWhenTheyAreCancelledAndCloseTheirConnections/Tls
+  Over/ManyAcquisitions.AllEndWhenTheirClientIsDestroyed/Tls
   OneServiceOnSixteenThreads.ComposesReadsAndVerifiesTwentyThousandTimesWithoutErrorOrGrowth
   Of/Truncation.EveryPrefixIsRefusedByTheParser/bearer_50k)
