@@ -25,7 +25,9 @@ public:
     return SystemClock::now();
   }
 
-  SteadyClock::time_point GetSteadyTime() const noexcept override { return SteadyClock::now(); }
+  SteadyClock::time_point GetSteadyTime() const noexcept override {
+    return SteadyClock::now();
+  }
 
   Tarvel::Ref<Tarvel::System::ScheduledItem> StartTimer(SteadyClock::time_point time,
                                                         std::function<void()> function) const override {
@@ -36,7 +38,8 @@ public:
 } // namespace
 
 const TimeSource &GetSystemTimeSource() noexcept {
-  static const SystemTimeSource source; // has no state and a trivial destructor, so it may be used until the process ends
+  static const SystemTimeSource
+      source; // has no state and a trivial destructor, so it may be used until the process ends
   return source;
 }
 

@@ -7,6 +7,7 @@
 #include <ssoclient/client/token_source.h>
 #include <ssoclient/saml_token.h>
 #include <ssoclient/token_spec.h>
+#include <tarvel/io/private_file.h>
 
 #include <functional>
 #include <memory>
@@ -22,35 +23,39 @@ struct CacheBinding {
   std::string options; ///< what else decides about the token, for example the names of dialect and profile
 };
 
-/// Safe on any thread. Its functions block: they read, write and wait for locks of other programs.
+/// Safe on any thread. Its functions block: they read and write files. None of them waits for another program.
 class TokenCacheFile {
 public:
   using Verify = std::function<std::shared_ptr<const SamlToken>(const std::string &xml)>;
 
+  /// Does not touch the file.
   /// @param verify makes a token of its XML, or throws
+  /// @throws Tarvel::InvalidArgumentException when the path is empty or contains a NUL
   TokenCacheFile(std::string path, CacheBinding binding, Verify verify);
 
-  /// The exclusive lock of the file, held until it is destroyed or the process ends.
-  class Lock;
+  /// The exclusive lock of the file, held until it is destroyed or the process ends. For one thread at a time.
+  using Lock = Tarvel::PrivateFileLock;
 
-  /// Tries to take the lock; null when another program has it.
+  /// Tries to take the lock; null when another program, or another lock of this one, has it.
   /// @throws Tarvel::IOException when the file is refused or cannot be made
-  std::unique_ptr<Lock> TryLock() const;
+  std::unique_ptr<Lock> TryLock() const { return m_file.TryLock(); }
 
   /// The token of this binding, verified again; null when there is none: no file, an empty, truncated or foreign one, another
   /// binding, a token that is refused now. Needs no lock.
-  /// @throws Tarvel::IOException when the file is refused (a link, another owner, a mode that lets others in) or cannot be read
+  /// @throws Tarvel::IOException when the file is refused (a link, another owner, a mode that lets others in) or cannot be read;
+  ///         what `verify` throws, unless it is the refusal of a token
   std::shared_ptr<const SamlToken> Read() const;
 
   /// Replaces the content as a whole; readers see the old or the new content.
   /// @throws Tarvel::IOException when it cannot be written, for example on a full disk; the old content then stays, and no other file is left.
-  void Write(const Lock &lock, const SamlToken &token) const;
+  void Write(Lock &lock, const SamlToken &token) const;
 
-  /// Removes the token from the file, if it is the one with this identifier.
-  void Remove(const Lock &lock, const std::string &tokenId) const;
+  /// Removes the token from the file, if it is the one with this identifier and has this binding.
+  /// @throws Tarvel::IOException when the file cannot be read or written
+  void Remove(Lock &lock, const std::string &tokenId) const;
 
 private:
-  std::string m_path;
+  Tarvel::PrivateFile m_file;
   CacheBinding m_binding;
   Verify m_verify;
 };

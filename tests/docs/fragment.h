@@ -5,6 +5,7 @@
 
 #pragma once
 
+#include <ssoclient/client/token_source.h>
 #include <ssoclient/ssoclient.h>
 #include <tarvel/core/checked_cast.h>
 #include <tarvel/core/secret_text.h>
@@ -21,6 +22,8 @@
 #include <algorithm>
 #include <chrono>
 #include <cstdint>
+#include <exception>
+#include <functional>
 #include <future>
 #include <iostream>
 #include <memory>
@@ -34,4 +37,9 @@
       [[maybe_unused]] SsoClient::SecurityTokenServiceConfig &config, [[maybe_unused]] SsoClient::TokenSpec &spec,     \
       [[maybe_unused]] std::shared_ptr<const SsoClient::SamlToken> &token,                                             \
       [[maybe_unused]] const Tarvel::Crypto::CertificateList &trusted, [[maybe_unused]] const std::string &xml,        \
-      [[maybe_unused]] const std::string &password, [[maybe_unused]] const Tarvel::SecretText &secret
+      [[maybe_unused]] const std::string &password, [[maybe_unused]] const Tarvel::SecretText &secret,                 \
+      [[maybe_unused]] const std::shared_ptr<const SsoClient::TokenClient> &client,                                    \
+      [[maybe_unused]] const std::shared_ptr<const SsoClient::TokenSource> &source,                                    \
+      [[maybe_unused]] const SsoClient::CredentialProvider &provider,                                                  \
+      [[maybe_unused]] const std::function<std::shared_ptr<SsoClient::NegotiationHandler>()> &makeHandler,             \
+      [[maybe_unused]] std::vector<std::function<void()>> &eventLoop

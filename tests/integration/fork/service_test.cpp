@@ -1,13 +1,10 @@
 // SPDX-License-Identifier: Apache-2.0
 // A service of the parent process, used by its child while the parent's operations are under way.
 
-#include "integration/fork/server_process.h"
+#include "integration/fork/held_service.h"
 #include "support/data_file.h"
 #include "support/forked.h"
-#include "support/posting_server.h"
-#include "support/process_resources.h"
 #include "support/rendezvous.h"
-#include "support/soap_responses.h"
 #include "support/throws_message.h"
 
 #include <ssoclient/connection_spec.h>
@@ -29,57 +26,12 @@ namespace {
 
 using Tarvel::Exception;
 using Tarvel::Ref;
+using Testing::HeldService;
 using Testing::RunInChild;
-using Testing::ServerConnection;
-using Testing::ServerProcess;
 using Testing::Shared;
-using Testing::TlsSettings;
 using TokenPtr = std::shared_ptr<const SamlToken>;
 
 constexpr const char *SUBJECT = "{Name: alice; Domain:corp.example}";
-
-/// Answers each request with a token. The answer to the user "slow" waits for `Answer`.
-class Service {
-public:
-  explicit Service(bool isSecure)
-      : m_isSecure(isSecure), m_server([this](ServerConnection &peer) { Serve(peer); },
-                                       isSecure ? std::optional(TlsSettings()) : std::nullopt),
-        m_context(Testing::ContextThatTrustsTheTestAuthority()) {}
-
-  SecurityTokenServiceConfig GetConfig() const {
-    SecurityTokenServiceConfig config = Testing::ConfigFor(
-        std::string(m_isSecure ? "https" : "http") + "://localhost:" + std::to_string(m_server.GetPort()) + "/sts");
-    config.sslContext = m_context.get();
-    return config;
-  }
-  int GetPort() const { return m_server.GetPort(); }
-
-  /// Waits for `count` requests whose answers are held back. Returns false if they do not arrive in time.
-  bool WaitForHeld(int count) const {
-    return Testing::Eventually([this, count] { return *m_held >= count; });
-  }
-  void Answer() const { *m_answers = true; }
-
-private:
-  void Serve(ServerConnection &peer) const {
-    if (m_isSecure && !peer.Handshake()) {
-      return;
-    }
-    if (peer.ReadRequest().find("slow@corp.example") != std::string::npos) {
-      ++*m_held;
-      Testing::Eventually([this] { return m_answers->load(); });
-    }
-    const std::string body = Testing::IssueResponse(Testing::ReadDataFile("tokens/bearer.xml"));
-    peer.Write("HTTP/1.1 200 OK\r\nContent-Type: text/xml\r\nContent-Length: " + std::to_string(body.size()) +
-               "\r\n\r\n" + body);
-  }
-
-  const bool m_isSecure;
-  const Shared<std::atomic<int>> m_held;
-  const Shared<std::atomic<bool>> m_answers;
-  const ServerProcess m_server;
-  const Ref<Tarvel::Ssl::SSLContext> m_context;
-};
 
 TokenSpec Spec() {
   TokenSpec spec;
@@ -118,7 +70,7 @@ std::string AcquireAsync(const SecurityTokenService &service) {
 
 class ServiceAfterFork : public testing::TestWithParam<bool> {
 protected:
-  const Service m_server{GetParam()};
+  const HeldService m_server{GetParam()};
   const SecurityTokenServiceConfig m_config = m_server.GetConfig();
   const std::shared_ptr<const SecurityTokenService> m_service = CreateSecurityTokenService(m_config);
 };
@@ -246,7 +198,8 @@ INSTANTIATE_TEST_SUITE_P(Transport, ServiceAfterFork, testing::Bool(),
                          [](const auto &isSecure) { return isSecure.param ? "Tls" : "PlainHttp"; });
 
 /// Starts a request that `server` does not answer yet.
-Ref<Tarvel::Http::PendingRequestItem> StartSlowRequest(const Service &server, const Ref<Tarvel::Http::UserAgent> &agent,
+Ref<Tarvel::Http::PendingRequestItem> StartSlowRequest(const HeldService &server,
+                                                       const Ref<Tarvel::Http::UserAgent> &agent,
                                                        const Shared<std::atomic<int>> &calls) {
   const Ref<Tarvel::Http::ClientRequest> request = Tarvel::Http::CreateHttpRequest("POST", "/sts");
   request->WriteBody("slow@corp.example");
@@ -261,7 +214,7 @@ Ref<Tarvel::Http::PendingRequestItem> StartSlowRequest(const Service &server, co
 }
 
 TEST(RequestAfterFork, EndsAWaitInTheChildAtOnce) {
-  const Service server(false);
+  const HeldService server(false);
   const Shared<std::atomic<int>> calls;
   Ref<Tarvel::Http::ConnectionSpec> spec;
   CreateSsoConnectionSpec("localhost", server.GetPort(), false, spec);

@@ -100,12 +100,6 @@ ServiceClient::ServiceClient(const std::string &identity, const std::string &url
     : m_context(TrustingContext()),
       m_service(SsoClient::CreateSecurityTokenService(ConfigFor(*m_context, identity, url))) {}
 
-SsoClient::TokenSpec SpecFor(std::int64_t lifetimeSec) {
-  SsoClient::TokenSpec spec;
-  spec.tokenLifetimeSec = lifetimeSec;
-  return spec;
-}
-
 SsoClient::TokenSpec FullSpec() {
   SsoClient::TokenSpec spec = SpecFor(7200);
   spec.audienceRestriction = {"https://b.example/", "https://a.example/"};

@@ -5,6 +5,7 @@
 #pragma once
 
 #include "support/dev_sts.h"
+#include "support/service_stand_ins.h"
 
 #include <ssoclient/security_token_service.h>
 #include <tarvel/ssl/ssl_context.h>
@@ -49,9 +50,6 @@ private:
   const Tarvel::Ref<Tarvel::Ssl::SSLContext> m_context;
   const std::shared_ptr<const SsoClient::SecurityTokenService> m_service;
 };
-
-/// A spec with a lifetime of that many seconds.
-SsoClient::TokenSpec SpecFor(std::int64_t lifetimeSec);
 
 /// Everything that a spec can request, except a delegate.
 SsoClient::TokenSpec FullSpec();

@@ -1,0 +1,46 @@
+// SPDX-License-Identifier: Apache-2.0
+
+#include "client/token_cache_file.h"
+
+#include "client/token_cache_text.h"
+
+#include <ssoclient/exceptions.h>
+#include <tarvel/xml/parser.h>
+
+#include <utility>
+
+namespace SsoClient {
+
+TokenCacheFile::TokenCacheFile(std::string path, CacheBinding binding, Verify verify)
+    : m_file(std::move(path)), m_binding(std::move(binding)), m_verify(std::move(verify)) {}
+
+std::shared_ptr<const SamlToken> TokenCacheFile::Read() const {
+  const boost::optional<std::string> text = m_file.Read();
+  const boost::optional<CachedToken> cached = text ? FindCachedToken(*text, m_binding) : boost::none;
+  if (!cached) {
+    return nullptr;
+  }
+  try {
+    std::shared_ptr<const SamlToken> token = m_verify(std::string(cached->xml));
+    // `Remove` goes by the identifier that the file states.
+    return token && CacheValue(token->GetId()) == cached->id ? token : nullptr;
+  } catch (const SsoException &) {
+    return nullptr;
+  } catch (const Tarvel::Xml::XMLParseException &) {
+    return nullptr;
+  }
+}
+
+void TokenCacheFile::Write(Lock &lock, const SamlToken &token) const {
+  lock.Replace(WriteCacheText(m_binding, token));
+}
+
+void TokenCacheFile::Remove(Lock &lock, const std::string &tokenId) const {
+  const std::string text = lock.Read();
+  const boost::optional<CachedToken> cached = FindCachedToken(text, m_binding);
+  if (cached && cached->id == CacheValue(tokenId)) {
+    lock.Clear();
+  }
+}
+
+} // namespace SsoClient

@@ -1,0 +1,16 @@
+// SPDX-License-Identifier: Apache-2.0
+/// @file
+/// Checks what a token source is made of.
+
+#pragma once
+
+#include <ssoclient/client/token_source.h>
+
+namespace SsoClient {
+
+/// Checks the arguments of the constructor of `TokenSource`.
+/// @throws Tarvel::InvalidArgumentException for the first one that is not valid
+void CheckTokenSource(bool hasClient, const CredentialProvider &provider, const TokenSpec &spec,
+                      const TokenSourceOptions &options);
+
+} // namespace SsoClient

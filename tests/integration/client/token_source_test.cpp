@@ -1,0 +1,199 @@
+// SPDX-License-Identifier: Apache-2.0
+// A token source over a client, against the development service over TLS.
+#include "support/operation_forms.h"
+#include "integration/service/service_client.h"
+#include "support/process_resources.h"
+#include "support/rendezvous.h"
+#include "support/throws_message.h"
+#include "support/work_folder.h"
+
+#include <ssoclient/exceptions.h>
+
+#include <gtest/gtest.h>
+
+#include <future>
+#include <memory>
+#include <mutex>
+#include <set>
+#include <string>
+#include <utility>
+#include <vector>
+
+namespace SsoClient {
+namespace {
+
+using namespace Testing;
+
+/// How often the running service has logged `text`.
+int CountLogged(const std::string &text) {
+  const std::string log = RunningService().GetLog();
+  int count = 0;
+  for (std::size_t at = log.find(text); at != std::string::npos; at = log.find(text, at + 1)) {
+    ++count;
+  }
+  return count;
+}
+
+class OneSource : public testing::Test {
+protected:
+  std::unique_ptr<TokenSource> Source(const TokenSpec &spec = SpecFor(3600), const TokenSourceOptions &options = {},
+                                      const std::string &identity = "") {
+    const auto client = std::make_shared<const TokenClient>(ConfigFor(*m_context, identity, RunningService().GetUrl()));
+    return std::make_unique<TokenSource>(
+        client,
+        [this]() -> Credential {
+          const std::lock_guard<std::mutex> lock(m_mutex);
+          ++m_asked;
+          return PasswordCredential{ALICE, Tarvel::SecretText(m_password)};
+        },
+        spec, options);
+  }
+
+  void SetPassword(const std::string &password) {
+    const std::lock_guard<std::mutex> lock(m_mutex);
+    m_password = password;
+  }
+  int CountAsked() {
+    const std::lock_guard<std::mutex> lock(m_mutex);
+    return m_asked;
+  }
+
+  /// The service writes its log after it has answered.
+  void ExpectIssued(int count) const {
+    EXPECT_TRUE(Eventually([&] { return CountLogged("issued _") - m_issuedBefore >= count; }));
+    EXPECT_EQ(CountLogged("issued _") - m_issuedBefore, count);
+  }
+
+  const Tarvel::Ref<Tarvel::Ssl::SSLContext> m_context = TrustingContext();
+
+private:
+  const int m_issuedBefore = CountLogged("issued _");
+  std::mutex m_mutex;
+  std::string m_password = PASSWORD;
+  int m_asked = 0;
+};
+
+class SourceOverTls : public OneSource, public testing::WithParamInterface<Form> {};
+
+TEST_P(SourceOverTls, ReturnsOneTokenAsLongAsItIsFresh) {
+  const auto source = Source();
+  const TokenPtr first = Get(GetParam(), *source);
+  EXPECT_EQ(first->GetSubject().ToString(), "{Name: alice; Domain:corp.example}");
+  for (int i = 0; i < 100; ++i) {
+    EXPECT_EQ(Get(GetParam(), *source), first);
+  }
+  ExpectIssued(1);
+  EXPECT_EQ(CountAsked(), 1);
+}
+
+TEST_P(SourceOverTls, ReturnsAnotherTokenAfterAnInvalidation) {
+  const auto source = Source();
+  const TokenPtr first = Get(GetParam(), *source);
+  source->Invalidate("_unknown");
+  EXPECT_EQ(Get(GetParam(), *source), first);
+  source->Invalidate(first->GetId());
+  const TokenPtr second = Get(GetParam(), *source);
+  EXPECT_NE(second->GetId(), first->GetId());
+  source->Invalidate(first->GetId()); // late, from another thread whose call was refused
+  EXPECT_EQ(Get(GetParam(), *source), second);
+  ExpectIssued(2);
+}
+
+TEST_P(SourceOverTls, UsesANewPasswordAtTheNextAttempt) {
+  TokenSourceOptions options;
+  options.firstBackOff = std::chrono::milliseconds(1);
+  options.longestBackOff = std::chrono::milliseconds(1);
+  const auto source = Source(SpecFor(3600), options);
+  SetPassword("looking-glass");
+  EXPECT_THROWS_MESSAGE(Get(GetParam(), *source), InvalidCredentialsException,
+                        "Authentication failed: unknown user or wrong password");
+  SetPassword(PASSWORD);
+  EXPECT_TRUE(Eventually([&] {
+    try {
+      return Get(GetParam(), *source) != nullptr;
+    } catch (const InvalidCredentialsException &) { // within the back-off
+      return false;
+    }
+  }));
+  ExpectIssued(1);
+}
+
+TEST_P(SourceOverTls, SharesItsTokenThroughAFile) {
+  const WorkFolder folder;
+  TokenSourceOptions options;
+  options.cache.emplace();
+  options.cache->path = folder / "token";
+  options.cache->owner = ALICE;
+  const TokenPtr first = Get(GetParam(), *Source(SpecFor(3600), options));
+  for (int i = 0; i < 5; ++i) {
+    EXPECT_EQ(Get(GetParam(), *Source(SpecFor(3600), options))->GetId(), first->GetId());
+  }
+  ExpectIssued(1);
+  EXPECT_NE(Get(GetParam(), *Source(SpecFor(1800), options))->GetId(), first->GetId()) << "another spec";
+  const auto source = Source(SpecFor(1800), options);
+  const TokenPtr refused = Get(GetParam(), *source);
+  source->Invalidate(refused->GetId());
+  EXPECT_NE(Get(GetParam(), *source)->GetId(), refused->GetId());
+  ExpectIssued(3);
+  EXPECT_EQ(folder.Names(), std::set<std::string>{"token"});
+}
+
+INSTANTIATE_TEST_SUITE_P(Forms, SourceOverTls, testing::ValuesIn(AllForms()),
+                         [](const auto &form) { return NameOf(form.param); });
+
+TEST_F(OneSource, SendsOneRequestForManyThreads) {
+  const auto source = Source();
+  std::vector<std::future<TokenPtr>> futures;
+  Gate gate;
+  for (int i = 0; i < 16; ++i) {
+    futures.push_back(std::async(std::launch::async, [&] {
+      gate.Pass();
+      return source->Get();
+    }));
+  }
+  ASSERT_TRUE(gate.WaitForArrivals(16));
+  gate.Open();
+  std::set<TokenPtr> tokens;
+  for (std::future<TokenPtr> &future : futures) {
+    tokens.insert(future.get());
+  }
+  EXPECT_EQ(tokens.size(), 1u);
+  ExpectIssued(1);
+}
+
+// The lifetime is so short that the token becomes due while the test waits for the renewal.
+TEST_F(OneSource, RenewsByItself) {
+  const int renewedBefore = CountLogged("renewed, issued _");
+  TokenSpec spec = SpecFor(2);
+  spec.renewable = true;
+  const auto source = Source(spec, {}, "client");
+  EventCount changes;
+  const ChangeRegistration registration = source->OnChange([&](const TokenPtr &) { changes.Add(); });
+  const TokenPtr first = source->Get();
+  source->Get(); // the source refreshes by itself only if it was asked since
+  ASSERT_TRUE(changes.WaitFor(2));
+  EXPECT_NE(source->Get()->GetId(), first->GetId());
+  EXPECT_TRUE(Eventually([&] { return CountLogged("renewed, issued _") > renewedBefore; }));
+}
+
+TEST_F(OneSource, EndsTheCallsThatWaitWhenItIsDestroyed) {
+  const auto client =
+      std::make_shared<const TokenClient>(ConfigFor(*m_context, "", RunningService().FaultUrl("stall")));
+  auto source = std::make_unique<TokenSource>(
+      client,
+      []() -> Credential {
+        return PasswordCredential{ALICE, Tarvel::SecretText(PASSWORD)};
+      },
+      SpecFor(60));
+  std::vector<std::future<TokenPtr>> futures;
+  for (int i = 0; i < 10; ++i) {
+    futures.push_back(source->GetFuture());
+  }
+  source.reset();
+  for (std::future<TokenPtr> &future : futures) {
+    EXPECT_THROW(Await(std::move(future)), CancelledException);
+  }
+}
+
+} // namespace
+} // namespace SsoClient

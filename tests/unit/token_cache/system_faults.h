@@ -1,0 +1,41 @@
+// SPDX-License-Identifier: Apache-2.0
+/// @file
+/// Faults of the system's functions for files. The test program replaces these functions.
+
+#pragma once
+
+#include <cstddef>
+#include <functional>
+#include <limits>
+
+namespace Testing {
+
+/// What the functions do. The errors are values of `errno`; 0 for none.
+struct SystemFaults {
+  bool interruptsOften = false;                                       ///< every second call fails with EINTR
+  std::size_t largestWrite = std::numeric_limits<std::size_t>::max(); ///< of one call
+  std::size_t space = std::numeric_limits<std::size_t>::max();        ///< then `write` fails with ENOSPC
+  int readError = 0;
+  int lockError = 0;
+  int synchronisationError = 0;
+  int renameError = 0;
+  int truncationError = 0;
+  bool dropsModes = false;                    ///< `fchmod` fails with EPERM
+  bool isOtherUser = false;                   ///< the process seems to have another effective user
+  std::function<void()> beforeLock = nullptr; ///< called once, before the next lock is taken
+  std::function<void()> beforeRename = nullptr;
+
+  int synchronisedFiles = 0; ///< counted
+  int synchronisedFolders = 0;
+};
+
+/// Until the end of the scope, the functions have these faults.
+class ScopedFaults {
+public:
+  explicit ScopedFaults(SystemFaults &faults) noexcept;
+  ScopedFaults(const ScopedFaults &) = delete;
+  ScopedFaults &operator=(const ScopedFaults &) = delete;
+  ~ScopedFaults();
+};
+
+} // namespace Testing
