@@ -5,7 +5,7 @@
 
 file(GLOB_RECURSE public_headers CONFIGURE_DEPENDS
   ${PROJECT_SOURCE_DIR}/include/*.h ${PROJECT_SOURCE_DIR}/tarvel/include/*.h
-  ${PROJECT_SOURCE_DIR}/gssapi/include/*.h)
+  ${PROJECT_SOURCE_DIR}/gssapi/include/*.h ${PROJECT_SOURCE_DIR}/asio/include/*.h)
 set(header_check_sources)
 set(header_check_includes "")
 foreach(header IN LISTS public_headers)
@@ -22,7 +22,8 @@ file(CONFIGURE OUTPUT ${header_check_together} CONTENT "@header_check_includes@"
 function(ssoclient_add_header_check target standard)
   add_library(${target} OBJECT EXCLUDE_FROM_ALL ${ARGN})
   target_include_directories(${target} PRIVATE
-    ${PROJECT_SOURCE_DIR}/include ${PROJECT_SOURCE_DIR}/tarvel/include ${PROJECT_SOURCE_DIR}/gssapi/include)
+    ${PROJECT_SOURCE_DIR}/include ${PROJECT_SOURCE_DIR}/tarvel/include ${PROJECT_SOURCE_DIR}/gssapi/include
+    ${PROJECT_SOURCE_DIR}/asio/include)
   target_link_libraries(${target} PRIVATE Boost::headers ssoclient_options)
   set_target_properties(${target} PROPERTIES CXX_STANDARD ${standard})
   add_dependencies(header_check ${target})

@@ -36,6 +36,17 @@ foreach(name tarvel ssoclient)
   install(FILES ${PROJECT_BINARY_DIR}/${name}.pc DESTINATION ${CMAKE_INSTALL_LIBDIR}/pkgconfig COMPONENT development)
 endforeach()
 
+# The functions for Boost.Asio are headers, which belong to the development files. Their target is separate, so that a program
+# requests what it uses.
+install(TARGETS ssoclient_asio EXPORT ssoclient-asio-targets
+  INCLUDES DESTINATION ${CMAKE_INSTALL_INCLUDEDIR})
+install(DIRECTORY asio/include/ DESTINATION ${CMAKE_INSTALL_INCLUDEDIR} COMPONENT development
+  FILES_MATCHING PATTERN "*.h")
+install(EXPORT ssoclient-asio-targets NAMESPACE ssoclient:: DESTINATION ${ssoclient_package_dir} COMPONENT development)
+configure_file(cmake/ssoclient-asio.pc.in ${PROJECT_BINARY_DIR}/ssoclient-asio.pc @ONLY)
+install(FILES ${PROJECT_BINARY_DIR}/ssoclient-asio.pc
+  DESTINATION ${CMAKE_INSTALL_LIBDIR}/pkgconfig COMPONENT development)
+
 # The handler over the GSSAPI is a separate option and component, so that the rest needs no Kerberos.
 if(TARGET ssoclient_gssapi)
   install(TARGETS ssoclient_gssapi EXPORT ssoclient-gssapi-targets

@@ -85,7 +85,7 @@ private:
   boost::asio::steady_timer m_alarm;
   TimePoint m_armedFor = TimePoint::max(); // at most the time of the earliest timer, unless memory has run out
   bool m_isArmed = false;
-  TimerQueue *const m_ofParent;
+  [[maybe_unused]] TimerQueue *const m_ofParent;
 };
 
 void Timer::Cancel() noexcept {

@@ -3,7 +3,7 @@
 // and its connection ends too, while the client still exists.
 
 #include "integration/client/fault_service.h"
-#include "integration/client/operation_forms.h"
+#include "support/operation_forms.h"
 #include "support/process_resources.h"
 #include "support/rendezvous.h"
 #include "support/sanitized.h"

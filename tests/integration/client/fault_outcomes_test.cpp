@@ -3,7 +3,7 @@
 // one of `SecurityTokenService`, in each form, and the next operation works.
 
 #include "integration/client/fault_service.h"
-#include "integration/client/operation_forms.h"
+#include "support/operation_forms.h"
 #include "support/data_file.h"
 #include "support/soap_responses.h"
 #include "support/unavailable_port.h"

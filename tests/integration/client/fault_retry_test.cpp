@@ -2,7 +2,7 @@
 // What is tried again, and how often, as the service and the resolver see it.
 
 #include "integration/client/fault_service.h"
-#include "integration/client/operation_forms.h"
+#include "support/operation_forms.h"
 #include "support/unavailable_port.h"
 #include "system/name_lookup.h"
 

@@ -1,8 +1,8 @@
 // SPDX-License-Identifier: Apache-2.0
 // Memory that runs out at each place in turn. A completion is still called once, unless the start has thrown.
+#include "integration/scarce_resources/memory_shortage.h"
 #include "support/completion.h"
 #include "support/process_resources.h"
-#include "support/refused_memory.h"
 #include "support/scripted_server.h"
 #include "system/name_lookup.h"
 
@@ -23,45 +23,6 @@
 #include <sys/prctl.h>
 #include <utility>
 #include <vector>
-
-namespace {
-
-enum class Shortage { NONE, OF_ONE_PIECE, FROM_ONE_PIECE_ON };
-
-std::atomic<Shortage> g_shortage{Shortage::NONE};
-std::atomic<int> g_piecesLeft{0};
-std::atomic<int> g_refused{0};
-thread_local bool isInStart = false;
-
-/// Whether the calling thread is one of the platform's threads, or is in a test's call that starts an operation.
-bool IsConcerned() noexcept {
-  thread_local const bool isOfPlatform = [] {
-    std::array<char, 16> name{};
-    ::prctl(PR_GET_NAME, name.data());
-    return std::strncmp(name.data(), "tarvel-", 7) == 0;
-  }();
-  return isOfPlatform || isInStart;
-}
-
-} // namespace
-
-bool Testing::IsMemoryRefused() noexcept {
-  const Shortage shortage = g_shortage;
-  if (shortage == Shortage::NONE || !IsConcerned()) {
-    return false;
-  }
-  const int left = g_piecesLeft--;
-  const bool isRefused = shortage == Shortage::OF_ONE_PIECE ? left == 0 : left <= 0;
-  g_refused += isRefused;
-  return isRefused;
-}
-
-// The linker calls this in place of the C library's function.
-void *RealAlignedAllocate(std::size_t alignment, std::size_t size) asm("__real_aligned_alloc");
-void *AlignedAllocate(std::size_t alignment, std::size_t size) asm("__wrap_aligned_alloc");
-void *AlignedAllocate(std::size_t alignment, std::size_t size) {
-  return Testing::IsMemoryRefused() ? nullptr : RealAlignedAllocate(alignment, size);
-}
 
 namespace Testing {
 namespace {
@@ -101,28 +62,6 @@ private:
   std::array<char, 256> m_message{};
   std::atomic<int> m_calls{0};
 };
-
-/// Calls `start`, and refuses allocation number `pieces`, counted from 0 in this call and on the platform's threads.
-/// The shortage lasts until `EndShortage`. Returns whether `start` threw.
-bool StartShortOfMemory(Shortage shortage, int pieces, const std::function<void()> &start) {
-  g_piecesLeft = pieces;
-  g_refused = 0;
-  g_shortage = shortage;
-  isInStart = true;
-  bool hasThrown = false;
-  try {
-    start();
-  } catch (const std::bad_alloc &) {
-    hasThrown = true;
-  }
-  isInStart = false;
-  return hasThrown;
-}
-
-int EndShortage() {
-  g_shortage = Shortage::NONE;
-  return g_refused;
-}
 
 struct Attempt {
   std::function<void(TcpClientSocket &)> prepare; ///< called before the shortage
@@ -236,9 +175,10 @@ TEST_P(WithoutMemory, CompletesAClosedConnectOnce) {
   const std::set<std::string> messages =
       FailAtEachPiece(GetParam(), {DoNothing,
                                    [&](TcpClientSocket &socket, Note &note) {
-                                     isInStart = false;
-                                     socket.AsyncConnect(host, full.GetPort(), note.ForEnd());
-                                     isInStart = true;
+                                     {
+                                       const EnoughMemory whileConnecting;
+                                       socket.AsyncConnect(host, full.GetPort(), note.ForEnd());
+                                     }
                                      socket.Close();
                                    },
                                    DoNothing});
