@@ -169,7 +169,7 @@ void MeasureGets(const Settings &settings, Figures &figures) {
       },
       GetCrowdSpec());
   figures.getOnOne = MeasureGet(source, 1, settings.getRounds, settings.getCalls);
-  figures.getOnMany = MeasureGet(source, MANY_THREADS, settings.getRounds, settings.getCalls / MANY_THREADS);
+  figures.getOnMany = MeasureGet(source, MANY_THREADS, settings.getRounds, settings.getCalls / 4);
 }
 
 void Print(const char *what, const UnderWay &figures) {

@@ -8,9 +8,11 @@
 
 #include <benchmark/benchmark.h>
 
+#include <algorithm>
 #include <atomic>
 #include <barrier>
 #include <chrono>
+#include <cstddef>
 #include <mutex>
 #include <thread>
 #include <vector>
@@ -21,25 +23,38 @@ namespace {
 
 using TokenPtr = std::shared_ptr<const SsoClient::SamlToken>;
 
+using Clock = std::chrono::steady_clock;
+
+/// When one thread has begun and ended.
+struct Period {
+  Clock::time_point begin;
+  Clock::time_point end;
+};
+
 /// Nanoseconds for one call of `get`, which each thread calls `calls` times.
 template <typename Get>
 double Measure(int threads, int calls, const Get &get) {
-  std::barrier start(threads + 1);
+  std::barrier start(threads);
+  std::vector<Period> periods(static_cast<std::size_t>(threads));
   std::vector<std::thread> running;
-  for (int i = 0; i < threads; ++i) {
+  for (Period &period : periods) {
     running.emplace_back([&] {
       start.arrive_and_wait();
+      period.begin = Clock::now();
       for (int call = 0; call < calls; ++call) {
         benchmark::DoNotOptimize(get());
       }
+      period.end = Clock::now();
     });
   }
-  start.arrive_and_wait();
-  const auto begun = std::chrono::steady_clock::now();
   for (std::thread &thread : running) {
     thread.join();
   }
-  const std::chrono::duration<double, std::nano> time = std::chrono::steady_clock::now() - begun;
+  const auto first = std::min_element(periods.begin(), periods.end(),
+                                      [](const Period &left, const Period &right) { return left.begin < right.begin; });
+  const auto last = std::max_element(periods.begin(), periods.end(),
+                                     [](const Period &left, const Period &right) { return left.end < right.end; });
+  const std::chrono::duration<double, std::nano> time = last->end - first->begin;
   return time.count() / calls;
 }
 

@@ -21,5 +21,8 @@ ssoclient_mark(20 in_full
   OneServiceOnSixteenThreadsOverTls.RunsTwentyThousandOperationsWithoutErrorOrGrowth
   Over/ClientSoak.HasOneOutcomeForEachOperationAndDoesNotGrow/Tcp
   Over/ClientSoak.HasOneOutcomeForEachOperationAndDoesNotGrow/Tls
+  Over/ManyAcquisitions.AreUnderWayAtOnceOnFewThreadsInLittleMemoryAndAllAreRight/Tls
+  Over/ManyAcquisitions.AllEndWhenTheyAreCancelledAndCloseTheirConnections/Tls
+  Over/ManyAcquisitions.AllEndWhenTheirClientIsDestroyed/Tls
   OneServiceOnSixteenThreads.ComposesReadsAndVerifiesTwentyThousandTimesWithoutErrorOrGrowth
   Of/Truncation.EveryPrefixIsRefusedByTheParser/bearer_50k)

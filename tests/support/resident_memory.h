@@ -11,8 +11,7 @@ namespace Testing {
 /// In units of 1024 octets. @throws std::runtime_error
 double ResidentKilobytes();
 
-/// The threads of this process whose names begin with "tarvel-". Those that look up names are among them, until they
-/// have been idle for half a second.
+/// The threads of this process whose names begin with "tarvel-", except those that look up names.
 std::size_t CountThreadsOfLibrary();
 
 } // namespace Testing

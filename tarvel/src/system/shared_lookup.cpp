@@ -35,7 +35,7 @@ struct Lookup {
 };
 
 struct Registry {
-  const Ref<ThreadPool> pool = CreateEndlessThreadPool(MAX_NAME_LOOKUPS, LOOKUP_IDLE_TIME);
+  const Ref<ThreadPool> pool = CreateEndlessThreadPool(MAX_NAME_LOOKUPS, LOOKUP_IDLE_TIME, "tarvel-lookup");
   ForkSafeMutex mutex;                                    // never held while a completion runs
   std::map<std::string, std::shared_ptr<Lookup>> lookups; // guarded by mutex; by name
   unsigned generation = GetForkGeneration();              // guarded by mutex; of the process that started the look-ups

@@ -44,8 +44,10 @@ void KeepThreadsOfParent(std::list<std::thread> &threads) {
 
 /// What the pool object, its threads and its items share; it lives as long as the last of them.
 struct PoolState {
-  PoolState(std::size_t threadCeiling, std::chrono::milliseconds threadIdleTime, bool isEndlessPool)
-      : ceiling(threadCeiling), idleTime(std::min(threadIdleTime, MAX_IDLE_TIME)), isEndless(isEndlessPool) {}
+  PoolState(std::size_t threadCeiling, std::chrono::milliseconds threadIdleTime, bool isEndlessPool,
+            const char *nameOfThreads)
+      : ceiling(threadCeiling), idleTime(std::min(threadIdleTime, MAX_IDLE_TIME)), isEndless(isEndlessPool),
+        threadName(nameOfThreads) {}
   PoolState(const PoolState &) = delete;
   PoolState &operator=(const PoolState &) = delete;
   ~PoolState() {
@@ -62,6 +64,7 @@ struct PoolState {
   const std::size_t ceiling;
   const std::chrono::milliseconds idleTime;
   const bool isEndless;
+  const char *const threadName;
 
   ForkSafeMutex mutex; // guards all that follows
   std::condition_variable_any changed;
@@ -186,7 +189,7 @@ void RunThread(const std::shared_ptr<PoolState> &pool, std::list<std::thread>::i
 void AddThread(const std::shared_ptr<PoolState> &pool) {
   const auto self = pool->threads.emplace(pool->threads.end());
   try {
-    *self = StartBackgroundThread("tarvel-pool", [pool, self] { RunThread(pool, self); });
+    *self = StartBackgroundThread(pool->threadName, [pool, self] { RunThread(pool, self); });
   } catch (...) {
     pool->threads.erase(self);
     throw;
@@ -207,8 +210,9 @@ void CancelQueued(PoolState &pool) {
 
 class ThreadPoolImpl final : public ThreadPool {
 public:
-  ThreadPoolImpl(std::size_t threadCeiling, std::chrono::milliseconds idleTime, bool isEndless)
-      : m_state(std::make_shared<PoolState>(std::max<std::size_t>(threadCeiling, 1), idleTime, isEndless)) {}
+  ThreadPoolImpl(std::size_t threadCeiling, std::chrono::milliseconds idleTime, bool isEndless, const char *threadName)
+      : m_state(std::make_shared<PoolState>(std::max<std::size_t>(threadCeiling, 1), idleTime, isEndless, threadName)) {
+  }
 
   Ref<ScheduledItem> QueueWorkItem(std::function<void()> work) override {
     const std::shared_ptr<PoolState> state = GetState();
@@ -269,8 +273,8 @@ private:
     {
       const std::lock_guard<ForkSafeMutex> lock(m_mutex);
       if (m_state->IsOfParent()) {
-        ofParent = std::exchange(m_state,
-                                 std::make_shared<PoolState>(m_state->ceiling, m_state->idleTime, m_state->isEndless));
+        ofParent = std::exchange(m_state, std::make_shared<PoolState>(m_state->ceiling, m_state->idleTime,
+                                                                      m_state->isEndless, m_state->threadName));
       }
       state = m_state;
     }
@@ -310,16 +314,18 @@ Ref<ThreadPool> GetThreadPool() {
 
 Ref<ThreadPool> GetComputePool() {
   const Computation computing;
-  static ThreadPool *const pool = CreateEndlessThreadPool(COMPUTE_THREAD_CEILING, DEFAULT_IDLE_TIME).Detach();
+  static ThreadPool *const pool =
+      CreateEndlessThreadPool(COMPUTE_THREAD_CEILING, DEFAULT_IDLE_TIME, "tarvel-compute").Detach();
   return Ref<ThreadPool>(pool);
 }
 
 Ref<ThreadPool> CreateThreadPool(std::size_t threadCeiling, std::chrono::milliseconds idleTime) {
-  return MakeRef<ThreadPoolImpl>(threadCeiling, idleTime, false);
+  return MakeRef<ThreadPoolImpl>(threadCeiling, idleTime, false, POOL_THREAD_NAME);
 }
 
-Ref<ThreadPool> CreateEndlessThreadPool(std::size_t threadCeiling, std::chrono::milliseconds idleTime) {
-  return MakeRef<ThreadPoolImpl>(threadCeiling, idleTime, true);
+Ref<ThreadPool> CreateEndlessThreadPool(std::size_t threadCeiling, std::chrono::milliseconds idleTime,
+                                        const char *threadName) {
+  return MakeRef<ThreadPoolImpl>(threadCeiling, idleTime, true, threadName);
 }
 
 ThreadEndHook SetThreadEndHook(ThreadEndHook hook) noexcept {

@@ -10,6 +10,7 @@
 #include <future>
 #include <memory>
 #include <optional>
+#include <stdexcept>
 
 namespace Tarvel::System {
 namespace {
@@ -21,7 +22,11 @@ auto RunOn(std::size_t thread, const Function &function) {
   const Computation computing;
   boost::asio::post(GetIoContextOf(thread), [task] { (*task)(); });
   const HostCall call;
-  return task->get_future().get();
+  auto result = task->get_future();
+  if (result.wait_for(Testing::PATIENCE) != std::future_status::ready) {
+    throw std::runtime_error("the I/O thread does not run");
+  }
+  return result.get();
 }
 
 TEST(IoContext, IsTheThreadsOwnOnAnIoThread) {

@@ -13,6 +13,7 @@
 
 #include <gtest/gtest.h>
 
+#include <array>
 #include <atomic>
 #include <chrono>
 #include <csignal>
@@ -324,6 +325,23 @@ TEST(ComputePool, HasAtMostFourThreads) {
   for (const Ref<ScheduledItem> &item : items) {
     EXPECT_TRUE(Eventually([&item] { return item->IsDone(); }));
   }
+}
+
+/// The name of the thread that runs an item of the pool.
+std::string ThreadNameIn(ThreadPool &pool) {
+  std::promise<std::string> name;
+  pool.QueueWorkItem([&name] {
+    std::array<char, 16> text{};
+    pthread_getname_np(pthread_self(), text.data(), text.size());
+    name.set_value(text.data());
+  });
+  return name.get_future().get();
+}
+
+TEST(ThreadsOfPools, HaveNamesThatShowTheirWork) {
+  EXPECT_EQ(ThreadNameIn(*GetComputePool()), "tarvel-compute");
+  EXPECT_EQ(ThreadNameIn(*GetThreadPool()), "tarvel-pool");
+  EXPECT_EQ(ThreadNameIn(*CreateThreadPool(1)), "tarvel-pool");
 }
 
 } // namespace
