@@ -48,7 +48,7 @@ ClientOperation::ClientOperation(std::shared_ptr<ClientCore> core, ClientTask ta
       m_kind(KindOf(task)), m_deadline(options.deadline),
       m_retryPolicy(options.retryPolicy.value_or(m_core->GetOptions().retryPolicy)),
       m_executor(options.executor ? options.executor : m_core->GetOptions().executor),
-      m_cancelToken(options.cancelToken), m_frame(NameOf(task), "TokenClient"),
+      m_cancelToken(options.cancelToken), m_frame(NameOf(task), CLIENT_LINES),
       m_events(m_observer.get(), NameOf(task), m_frame.GetId()) {
   try {
     CheckRetryPolicy(m_retryPolicy);

@@ -11,18 +11,18 @@ namespace SsoClient {
 
 using Tarvel::Service::LogInternal;
 
-OperationFrame::OperationFrame(const std::string &operationName, const char *className)
-    : m_opId(Tarvel::StringUtil::GenerateUuid()), m_operationName(operationName), m_className(className) {
-  LogInternal(getLogger(), LOG_LEVEL_OPERATION, "opId=%1 START operation %2::%3", m_opId, m_className, m_operationName);
+OperationFrame::OperationFrame(const std::string &operationName, const FrameLines &lines)
+    : m_opId(Tarvel::StringUtil::GenerateUuid()), m_operationName(operationName), m_endLine(lines.end) {
+  LogInternal(getLogger(), LOG_LEVEL_OPERATION, lines.start, m_opId, m_operationName);
 }
 
 void OperationFrame::LogEnd() noexcept {
-  const char *const className = std::exchange(m_className, nullptr);
-  if (!className) {
+  const char *const line = std::exchange(m_endLine, nullptr);
+  if (!line) {
     return;
   }
   try {
-    LogInternal(getLogger(), LOG_LEVEL_OPERATION, "opId=%1 END operation %2::%3", m_opId, className, m_operationName);
+    LogInternal(getLogger(), LOG_LEVEL_OPERATION, line, m_opId, m_operationName);
   } catch (...) {
     // Out of memory: the line is lost, but the outcome of the operation is not.
   }

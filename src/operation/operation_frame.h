@@ -8,12 +8,24 @@
 
 namespace SsoClient {
 
+/// The two lines of one kind of operation; %1 is the UUID, %2 the operation's name. They live as long as the process.
+struct FrameLines {
+  const char *start;
+  const char *end;
+};
+
+/// Of the operations of `SecurityTokenService`.
+constexpr FrameLines SERVICE_LINES{"opId=%1 START operation SecurityTokenServiceImpl::%2",
+                                   "opId=%1 END operation SecurityTokenServiceImpl::%2"};
+
+/// Of the operations of `TokenClient`.
+constexpr FrameLines CLIENT_LINES{"opId=%1 START operation TokenClient::%2", "opId=%1 END operation TokenClient::%2"};
+
 /// Logs the start when it is created, and the end once: at the latest when it is destroyed, after a return or an exception.
 /// Both lines have the same new UUID.
 class OperationFrame {
 public:
-  /// @param className of the object that runs the operation; it is part of both lines
-  explicit OperationFrame(const std::string &operationName, const char *className = "SecurityTokenServiceImpl");
+  explicit OperationFrame(const std::string &operationName, const FrameLines &lines = SERVICE_LINES);
   OperationFrame(const OperationFrame &) = delete;
   OperationFrame &operator=(const OperationFrame &) = delete;
   ~OperationFrame() { LogEnd(); }
@@ -27,7 +39,7 @@ public:
 private:
   std::string m_opId;
   std::string m_operationName;
-  const char *m_className; // null after the end has been logged
+  const char *m_endLine; // null after the end has been logged
 };
 
 } // namespace SsoClient

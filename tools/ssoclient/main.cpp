@@ -165,6 +165,12 @@ void AddCommonOptions(CLI::App &app, Format format, OutputOptions &output,
           "when the format is json");
 }
 
+void ShowLog(bool isVerbose) {
+  if (isVerbose) {
+    ShowLibraryLog();
+  }
+}
+
 int Run(int argc, char **argv) {
   CLI::App app("Acquires, renews, validates, verifies and shows SAML 2.0 tokens of a WS-Trust 1.3 token service.",
                "ssoclient");
@@ -199,9 +205,7 @@ int Run(int argc, char **argv) {
     throw UsageException(Explain(app, error) + "; see ssoclient --help");
   }
   WatchCommand(timeout, output.format);
-  if (output.verbose) {
-    ShowLibraryLog();
-  }
+  ShowLog(output.verbose);
   if (usesSystemCrypto) {
     Tarvel::Crypto::UseSystemConfiguration();
   }
