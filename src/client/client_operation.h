@@ -45,7 +45,7 @@ struct OperationEnding {
 class ClientOperation final : public std::enable_shared_from_this<ClientOperation>, private EventsEndListener {
 public:
   /// Called once with the ending.
-  using Completion = std::function<void(const OperationEnding &ending)>;
+  using Completion = std::function<void(OperationEnding &&ending)>;
 
   /// Reports the start.
   ClientOperation(std::shared_ptr<ClientCore> core, ClientTask task, const CallOptions &options);
@@ -63,7 +63,7 @@ public:
   OperationEnding RunToEnd();
 
   /// Ends the operation with `failure` if it has not been decided how it ends.
-  void Cancel(const std::exception_ptr &failure) noexcept;
+  void Cancel(std::exception_ptr failure) noexcept;
 
   /// The place in the client's list; used under the lock of the list.
   boost::optional<OperationList::iterator> place;
@@ -149,7 +149,7 @@ private:
   void OnEventsEnded() noexcept override;
   void Deliver(bool isOnComputePool) noexcept;
   void Complete() noexcept;
-  bool Abandon(const std::exception_ptr &failure) noexcept;
+  bool Abandon(std::exception_ptr failure) noexcept;
   bool IsOfParent() const noexcept { return m_generation != Tarvel::GetForkGeneration(); }
 
   const unsigned m_generation = Tarvel::GetForkGeneration();
