@@ -111,7 +111,6 @@ void ClientCore::Remove(ClientOperation &operation) noexcept {
 
 void ClientCore::Close() noexcept {
   ForgetParent();
-  const std::exception_ptr destroyed = MakeClientDestroyed();
   for (;;) {
     std::shared_ptr<ClientOperation> operation;
     {
@@ -124,7 +123,7 @@ void ClientCore::Close() noexcept {
       m_operations.pop_front();
       operation->place = boost::none;
     }
-    operation->Cancel(destroyed);
+    operation->Cancel(MakeClientDestroyed());
   }
 }
 

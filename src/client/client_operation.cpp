@@ -88,10 +88,11 @@ OperationEnding ClientOperation::RunToEnd() {
     }
   }
   lock.unlock();
-  if (m_ending.failure) {
-    std::rethrow_exception(m_ending.failure);
+  OperationEnding ending = std::move(m_ending);
+  if (ending.failure) {
+    std::rethrow_exception(std::move(ending.failure));
   }
-  return m_ending;
+  return ending;
 }
 
 /// @return false when the time is up.
@@ -132,7 +133,7 @@ void ClientOperation::Launch() {
     } else if (m_deadline && *m_deadline <= m_core->GetTime().GetSteadyTime()) {
       Cancel(Late());
     } else if (m_refusal) {
-      Cancel(m_refusal);
+      Cancel(std::move(m_refusal));
     } else if (!m_core->Add(shared_from_this())) {
       Cancel(MakeClientDestroyed());
     } else {
@@ -249,8 +250,8 @@ bool ClientOperation::IsDecided() const noexcept {
   return m_isDecided || IsOfParent();
 }
 
-void ClientOperation::Cancel(const std::exception_ptr &failure) noexcept {
-  if (Decide({failure, nullptr, false})) {
+void ClientOperation::Cancel(std::exception_ptr failure) noexcept {
+  if (Decide({std::move(failure), nullptr, false})) {
     FinishElsewhere();
   }
 }
@@ -332,15 +333,15 @@ void ClientOperation::Deliver(bool isOnComputePool) noexcept {
 void ClientOperation::Complete() noexcept {
   const Completion completion = std::exchange(m_completion, nullptr);
   try {
-    completion(m_ending);
+    completion(std::move(m_ending));
   } catch (...) {
     LogCaughtException("", "A callback", SecretMask());
   }
 }
 
 /// The operation has not started. @return false when it was decided before how it ends.
-bool ClientOperation::Abandon(const std::exception_ptr &failure) noexcept {
-  if (!Decide({failure, nullptr, false})) {
+bool ClientOperation::Abandon(std::exception_ptr failure) noexcept {
+  if (!Decide({std::move(failure), nullptr, false})) {
     return false;
   }
   m_completion = nullptr;

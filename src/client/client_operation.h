@@ -37,15 +37,15 @@ struct OperationEnding {
 /// so no thread is held while the network is waited for.
 ///
 /// Cancelling, the deadline, the end of the client and the regular end compete to decide how it ends; the first one wins,
-/// and the others do nothing. A step that runs at this moment goes on without effect: nothing is sent or reported after the
-/// decision. The observer's `OnEnded` comes before the outcome. What is secret is released at the decision, or, if a step
-/// uses it, at the end of that step.
+/// and the others do nothing. A step that runs at this moment goes on without effect: it sends nothing more, and no step
+/// follows. The observer's `OnEnded` comes before the outcome, and no event comes after it. What is secret is released at the
+/// decision, or, if a step uses it, at the end of that step.
 ///
 /// In a child of `fork`, the operations of the parent do nothing.
 class ClientOperation final : public std::enable_shared_from_this<ClientOperation>, private EventsEndListener {
 public:
   /// Called once with the ending.
-  using Completion = std::function<void(const OperationEnding &ending)>;
+  using Completion = std::function<void(OperationEnding &&ending)>;
 
   /// Reports the start.
   ClientOperation(std::shared_ptr<ClientCore> core, ClientTask task, const CallOptions &options);
@@ -63,7 +63,7 @@ public:
   OperationEnding RunToEnd();
 
   /// Ends the operation with `failure` if it has not been decided how it ends.
-  void Cancel(const std::exception_ptr &failure) noexcept;
+  void Cancel(std::exception_ptr failure) noexcept;
 
   /// The place in the client's list; used under the lock of the list.
   boost::optional<OperationList::iterator> place;
@@ -149,7 +149,7 @@ private:
   void OnEventsEnded() noexcept override;
   void Deliver(bool isOnComputePool) noexcept;
   void Complete() noexcept;
-  bool Abandon(const std::exception_ptr &failure) noexcept;
+  bool Abandon(std::exception_ptr failure) noexcept;
   bool IsOfParent() const noexcept { return m_generation != Tarvel::GetForkGeneration(); }
 
   const unsigned m_generation = Tarvel::GetForkGeneration();

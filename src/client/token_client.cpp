@@ -37,20 +37,27 @@ std::shared_ptr<ClientOperation> MakeOperation(const std::shared_ptr<ClientCore>
   return std::make_shared<ClientOperation>(core, std::move(task), options);
 }
 
+void SetValue(std::promise<std::shared_ptr<const SamlToken>> &promise, OperationEnding &&ending) {
+  promise.set_value(std::move(ending.token));
+}
+
+void SetValue(std::promise<bool> &promise, OperationEnding &&ending) {
+  promise.set_value(ending.isValid);
+}
+
 /// Starts an operation whose end sets the promise of the returned future.
-template <typename Value, typename ToOutcome>
-std::future<Value> StartWithFuture(const std::shared_ptr<ClientCore> &core, ClientTask task, const CallOptions &options,
-                                   ToOutcome toOutcome) {
+template <typename Value>
+std::future<Value> StartWithFuture(const std::shared_ptr<ClientCore> &core, ClientTask task,
+                                   const CallOptions &options) {
   const auto promise = std::make_shared<std::promise<Value>>();
   std::future<Value> future = promise->get_future();
   MakeOperation(core, std::move(task), options)
       ->Start(
-          [promise, toOutcome](const OperationEnding &ending) {
-            const Outcome<Value> outcome = toOutcome(ending);
-            if (outcome.HasValue()) {
-              promise->set_value(outcome.Get());
+          [promise](OperationEnding &&ending) {
+            if (ending.failure) {
+              promise->set_exception(std::move(ending.failure));
             } else {
-              promise->set_exception(outcome.GetException());
+              SetValue(*promise, std::move(ending));
             }
           },
           true);
@@ -117,20 +124,18 @@ void TokenClient::StartValidate(const std::shared_ptr<ClientCore> &core, const s
 
 std::future<std::shared_ptr<const SamlToken>>
 TokenClient::AcquireFuture(const Credential &credential, const TokenSpec &spec, const CallOptions &options) const {
-  return StartWithFuture<std::shared_ptr<const SamlToken>>(m_core, Acquisition{credential, spec}, options,
-                                                           ToTokenOutcome);
+  return StartWithFuture<std::shared_ptr<const SamlToken>>(m_core, Acquisition{credential, spec}, options);
 }
 
 std::future<std::shared_ptr<const SamlToken>> TokenClient::RenewFuture(const std::shared_ptr<const SamlToken> &token,
                                                                        std::int64_t lifetimeSec,
                                                                        const CallOptions &options) const {
-  return StartWithFuture<std::shared_ptr<const SamlToken>>(m_core, Renewal{token, lifetimeSec}, options,
-                                                           ToTokenOutcome);
+  return StartWithFuture<std::shared_ptr<const SamlToken>>(m_core, Renewal{token, lifetimeSec}, options);
 }
 
 std::future<bool> TokenClient::ValidateFuture(const std::shared_ptr<const SamlToken> &token,
                                               const CallOptions &options) const {
-  return StartWithFuture<bool>(m_core, Validation{token}, options, ToValidityOutcome);
+  return StartWithFuture<bool>(m_core, Validation{token}, options);
 }
 
 } // namespace SsoClient

@@ -13,23 +13,23 @@
 namespace SsoClient {
 
 /// What `ending` means for an operation whose result is a token.
-inline TokenOutcome ToTokenOutcome(const OperationEnding &ending) {
-  return ending.failure ? TokenOutcome(ending.failure) : TokenOutcome(ending.token);
+inline TokenOutcome ToTokenOutcome(OperationEnding &&ending) {
+  return ending.failure ? TokenOutcome(std::move(ending.failure)) : TokenOutcome(std::move(ending.token));
 }
 
 /// What `ending` means for a validation.
-inline ValidityOutcome ToValidityOutcome(const OperationEnding &ending) {
-  return ending.failure ? ValidityOutcome(ending.failure) : ValidityOutcome(ending.isValid);
+inline ValidityOutcome ToValidityOutcome(OperationEnding &&ending) {
+  return ending.failure ? ValidityOutcome(std::move(ending.failure)) : ValidityOutcome(ending.isValid);
 }
 
 /// Calls `callback` with the outcome.
 inline ClientOperation::Completion CompletionOf(TokenCallback callback) {
-  return [callback = std::move(callback)](const OperationEnding &ending) { callback(ToTokenOutcome(ending)); };
+  return [callback = std::move(callback)](OperationEnding &&ending) { callback(ToTokenOutcome(std::move(ending))); };
 }
 
 /// Calls `callback` with the outcome.
 inline ClientOperation::Completion CompletionOf(ValidityCallback callback) {
-  return [callback = std::move(callback)](const OperationEnding &ending) { callback(ToValidityOutcome(ending)); };
+  return [callback = std::move(callback)](OperationEnding &&ending) { callback(ToValidityOutcome(std::move(ending))); };
 }
 
 } // namespace SsoClient

@@ -24,9 +24,13 @@ namespace SsoClient {
 /// answered with the status 503 and a header `Retry-After`, for which the policy waits as long as the service demands. An
 /// operation is not tried again when its deadline would pass during the wait. It then ends at once with the failure of the
 /// last attempt.
+///
+/// Of a negotiation, only the first leg is tried again, with a new handler. A policy with less than one attempt or with a
+/// negative delay is refused with `Tarvel::InvalidArgumentException`.
 struct RetryPolicy {
-  int attempts = 1;                               ///< at most so many, the first included; at least 1
-  std::chrono::milliseconds firstDelay{200};      ///< before the second attempt; it doubles for each further one
+  int attempts = 1; ///< at most so many, the first included; at least 1
+  /// Before the second attempt. It doubles for each further one, and is shortened by up to a half at random.
+  std::chrono::milliseconds firstDelay{200};
   std::chrono::milliseconds longestDelay{10'000}; ///< no delay is longer; a longer `Retry-After` ends the operation
 };
 

@@ -345,58 +345,5 @@ TEST(CallOptions, HasADeadlineForEveryTime) {
   EXPECT_GT(deadlineAfter(std::chrono::milliseconds::max()), now + std::chrono::hours(24 * 365 * 99));
 }
 
-#ifdef SSOCLIENT_HAS_COROUTINES
-
-/// A coroutine that starts at once.
-struct Eager {
-  struct promise_type {
-    Eager get_return_object() noexcept { return {}; }
-    std::suspend_never initial_suspend() noexcept { return {}; }
-    std::suspend_never final_suspend() noexcept { return {}; }
-    void return_void() noexcept {}
-    void unhandled_exception() noexcept { std::terminate(); }
-  };
-};
-
-Eager AwaitAll(std::shared_ptr<TokenClient> client, std::function<void(const TokenOutcome &)> record) {
-  try {
-    co_await client->AcquireAwaitable(Alice(), SpecFor(60));
-    co_await client->RenewAwaitable(Testing::HolderToken(), 60);
-    record(Testing::HolderToken());
-    co_await client->ValidateAwaitable(nullptr);
-  } catch (...) {
-    record(std::current_exception());
-  }
-}
-
-TEST(TokenClient, IsAwaitedByACoroutine) {
-  const auto transport = Answering({"issued:" + Testing::BearerXml(), "renewed:" + Testing::BearerXml()});
-  const Outcomes outcomes;
-  AwaitAll(ClientOn(transport), outcomes.Record());
-  EXPECT_EQ(outcomes.Wait(2)[1], "InvalidArgumentException: Invalid argument : a required object may not be NULL");
-  EXPECT_EQ(transport->Sent().size(), 2u);
-}
-
-TEST(TokenClient, CancelsAnAwaitableThatOutlivesIt) {
-  const auto transport = std::make_shared<ScriptedTransport>(Testing::Issue);
-  auto client = ClientOn(transport);
-  auto awaitable = client->AcquireAwaitable(Alice(), SpecFor(60));
-  client = nullptr;
-  const Outcomes outcomes;
-  const auto await = [](Awaitable<std::shared_ptr<const SamlToken>> own,
-                        std::function<void(const TokenOutcome &)> record) -> Eager {
-    try {
-      co_await std::move(own);
-    } catch (...) {
-      record(std::current_exception());
-    }
-  };
-  await(std::move(awaitable), outcomes.Record());
-  EXPECT_EQ(outcomes.Wait(), Strings{Testing::DESTROYED});
-  EXPECT_EQ(transport->Sent(), Strings());
-}
-
-#endif
-
 } // namespace
 } // namespace SsoClient

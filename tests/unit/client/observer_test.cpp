@@ -10,8 +10,10 @@
 
 #include <gtest/gtest.h>
 
+#include <atomic>
 #include <functional>
 #include <memory>
+#include <mutex>
 #include <stdexcept>
 #include <string>
 #include <thread>
@@ -174,41 +176,90 @@ TEST(ObservedOperation, MayBeCancelledByItsObserverBeforeItIsSent) {
   EXPECT_EQ(observer->end, "The operation was cancelled");
 }
 
-/// Stops in an event, and counts the events after the end.
+/// Stops in an event, and records the events from there.
 class StoppingObserver final : public OperationObserver {
 public:
-  void OnResponseReceived(const OperationInfo &, const ResponseReceivedEvent &) override { gate.Pass(); }
-  void OnFault(const OperationInfo &, const FaultEvent &) override { ++faults; }
-  void OnEnded(const OperationInfo &, const OperationEndedEvent &) override { ++ends; }
+  void OnResponseReceived(const OperationInfo &, const ResponseReceivedEvent &) override {
+    gate.Pass();
+    Add("received");
+  }
+  void OnFault(const OperationInfo &, const FaultEvent &) override { Add("fault"); }
+  void OnEnded(const OperationInfo &, const OperationEndedEvent &event) override { Add("ended: " + event.message); }
+
+  Strings Get() const {
+    const std::lock_guard<std::mutex> lock(m_mutex);
+    return m_events;
+  }
 
   Gate gate;
-  std::atomic<int> faults{0};
-  std::atomic<int> ends{0};
+
+private:
+  void Add(const std::string &event) {
+    const std::lock_guard<std::mutex> lock(m_mutex);
+    m_events.push_back(event);
+  }
+
+  mutable std::mutex m_mutex;
+  Strings m_events;
 };
 
-TEST(ObservedOperation, EndsAfterTheEventThatIsBeingReportedAndReportsNoOther) {
+TEST(ObservedOperation, EndsAfterTheEventThatIsBeingReported) {
   const CancelSource source;
   const auto observer = std::make_shared<StoppingObserver>();
-  ClientOptions clientOptions;
-  clientOptions.service.observer = observer;
-  const auto client =
-      RealClientOn(std::make_shared<ScriptedTransport>([](const Request &, int) {
-                     return boost::make_optional(Testing::Success(Testing::FaultResponse("wst:BadRequest", "bad")));
-                   }),
-                   clientOptions);
+  const auto client = Testing::ClientOn(std::make_shared<ScriptedTransport>(Testing::Issue));
   CallOptions options;
+  options.observer = observer;
   options.cancelToken = source.GetToken();
   const Outcomes outcomes;
   client->AcquireAsync(Testing::Alice(), SpecFor(60), options, outcomes.Record());
   EXPECT_TRUE(observer->gate.WaitForArrivals(1));
   source.Cancel();
-  EXPECT_EQ(observer->ends, 0);
+  EXPECT_EQ(observer->Get(), Strings());
   EXPECT_EQ(outcomes.Get(), Strings());
   observer->gate.Open();
   EXPECT_EQ(outcomes.Wait(), Strings{Testing::CANCELLED});
   EXPECT_TRUE(outcomes.AreReleased());
-  EXPECT_EQ(observer->ends, 1);
-  EXPECT_EQ(observer->faults, 0);
+  EXPECT_EQ(observer->Get(), (Strings{"received", "ended: The operation was cancelled"}));
+}
+
+/// Counts its calls.
+class CountingListener final : public EventsEndListener {
+public:
+  void OnEventsEnded() noexcept override { ++calls; }
+  std::atomic<int> calls{0};
+};
+
+TEST(EndOfEvents, IsReportedByTheThreadThatReportsAnEvent) {
+  StoppingObserver observer;
+  const std::string id;
+  OperationEvents events(&observer, "AcquireToken", id);
+  std::thread step([&events] {
+    const ResponseFacts facts;
+    events.EndExchange(&facts, "broken");
+    events.EndExchange(&facts, "dropped, because it comes after the end");
+  });
+  EXPECT_TRUE(observer.gate.WaitForArrivals(1));
+  CountingListener listener;
+  EXPECT_FALSE(events.End(std::make_exception_ptr(SsoException("over")), listener));
+  EXPECT_EQ(observer.Get(), Strings());
+  EXPECT_EQ(listener.calls, 0);
+  observer.gate.Open();
+  step.join();
+  EXPECT_EQ(observer.Get(), (Strings{"received", "ended: over"}));
+  EXPECT_EQ(listener.calls, 1);
+}
+
+TEST(EndOfEvents, IsReportedAtOnceWhenNoEventIsReported) {
+  StoppingObserver observer;
+  observer.gate.Open();
+  const std::string id;
+  OperationEvents events(&observer, "AcquireToken", id);
+  CountingListener listener;
+  EXPECT_TRUE(events.End(nullptr, listener));
+  const ResponseFacts facts;
+  events.EndExchange(&facts, "dropped");
+  EXPECT_EQ(observer.Get(), (Strings{"ended: "}));
+  EXPECT_EQ(listener.calls, 0);
 }
 
 TEST(RefusedTokenSink, MayThrowAfterItsOperationWasCancelled) {

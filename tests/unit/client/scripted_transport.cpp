@@ -145,6 +145,12 @@ private:
 
 ScriptedTransport::ScriptedTransport(Script script) : m_state(std::make_shared<State>(std::move(script))) {}
 
+ScriptedTransport::~ScriptedTransport() {
+  std::vector<Ref<Pending>> held; // destroyed after the lock: each of them shares the state
+  const std::lock_guard<std::mutex> lock(m_state->mutex);
+  held.swap(m_state->held);
+}
+
 std::shared_ptr<SsoClient::TransportSession> ScriptedTransport::CreateSession() const {
   return std::make_shared<Session>(m_state);
 }

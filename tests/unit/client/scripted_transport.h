@@ -39,6 +39,9 @@ public:
   using Script = std::function<boost::optional<Reply>(const SsoClient::Request &request, int number)>;
 
   explicit ScriptedTransport(Script script);
+  ScriptedTransport(const ScriptedTransport &) = delete;
+  ScriptedTransport &operator=(const ScriptedTransport &) = delete;
+  ~ScriptedTransport();
 
   std::shared_ptr<SsoClient::TransportSession> CreateSession() const override;
 
