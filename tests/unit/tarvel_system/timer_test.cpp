@@ -79,6 +79,14 @@ TEST(Timer, CallsInTheOrderOfTheTimesWhateverTheOrderOfTheStarts) {
   EXPECT_EQ(order, (std::vector<int>{0, 1, 2, 3, 4}));
 }
 
+TEST(Timer, IsNotLateWhenALaterOneWasStartedBefore) {
+  const Ref<ScheduledItem> later = StartTimer(Clock::now() + LATER, [] {});
+  EventCount calls;
+  StartTimer(Clock::now() + std::chrono::milliseconds(1), [&calls] { calls.Add(); });
+  EXPECT_TRUE(calls.WaitFor(1));
+  later->Cancel();
+}
+
 TEST(Timer, IsNotLateWhenAnEarlierOneIsCancelled) {
   EventCount calls;
   const Ref<ScheduledItem> earlier = StartTimer(Clock::now() + std::chrono::milliseconds(10), [] {});
@@ -134,6 +142,7 @@ TEST(Timer, MayBeStartedAndCancelledByTheFunctionOfAnother) {
 }
 
 TEST(Timer, PreventsTheCallOfATimerThatIsDueAtTheSameTime) {
+  const Testing::RecordedLog log;
   // A blocked function keeps the next two waiting until both are due.
   Gate gate;
   StartTimer(Clock::now(), [&gate] { gate.Pass(); });
@@ -147,6 +156,7 @@ TEST(Timer, PreventsTheCallOfATimerThatIsDueAtTheSameTime) {
   EXPECT_TRUE(Eventually([&] { return first->IsDone() && second->IsDone(); }));
   ASSERT_TRUE(DrainIoThreads());
   EXPECT_EQ(calls, 0);
+  EXPECT_EQ(log.Lines(), std::vector<std::string>()) << "the function was released, but called";
 }
 
 TEST(Timer, LogsAnExceptionAndIsDone) {
