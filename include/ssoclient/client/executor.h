@@ -14,7 +14,7 @@ namespace SsoClient {
 /// An executor refuses a function by throwing, or by destroying it without having run it. The function then runs on a
 /// thread of the library, because each operation must end with exactly one outcome; what an executor throws is logged.
 ///
-/// An empty executor stands for the library's own threads (at most four), on which a callback must not block.
+/// An empty executor means the library's own threads (at most four), on which a callback must not block.
 using Executor = std::function<void(std::function<void()> function)>;
 
 } // namespace SsoClient
