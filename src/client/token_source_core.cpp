@@ -126,11 +126,14 @@ void TokenSourceCore::Join(const GetOptions &options, const CancelToken &otherTo
   std::shared_ptr<RefreshAttempt> attempt;
   const Moment now = ReadClocks(m_setup.time);
   std::uint64_t number = 0;
-  {
+  try {
     const std::lock_guard<Tarvel::ForkSafeMutex> lock(m_mutex);
     AdoptInChild();
     number = ++m_calls;
     outcome = Ask(now, number, waiter, attempt);
+  } catch (...) {
+    waiter->Withdraw(); // no memory: the waiter refers to itself until it is decided
+    throw;
   }
   if (outcome) {
     waiter->Deliver(*outcome);

@@ -6,7 +6,6 @@
 #include "support/data_file.h"
 #include "support/posting_server.h"
 #include "support/process_resources.h"
-#include "support/repetitions.h"
 #include "support/soap_responses.h"
 
 #include <ssoclient/client/token_client.h>
@@ -74,11 +73,11 @@ bool IsDocumented(const std::string &message, int port) {
          message == "Cannot connect to 127.0.0.1:" + std::to_string(port) + ": there is not enough memory";
 }
 
-/// Starts operations with each allocation refused in turn. Only every `step`th one is refused.
-void ExpectOneOutcomeWhereverMemoryRunsOut(Shortage shortage, int port, int step,
+/// Starts operations with each allocation refused in turn.
+void ExpectOneOutcomeWhereverMemoryRunsOut(Shortage shortage, int port,
                                            const std::function<void(OutcomeNote &)> &start) {
   std::set<std::string> messages;
-  for (int pieces = 0;; pieces += step) {
+  for (int pieces = 0;; ++pieces) {
     ASSERT_LT(pieces, MAX_PIECES);
     EXPECT_TRUE(DrainIoThreads());
     OutcomeNote note;
@@ -114,7 +113,6 @@ SsoClient::TokenSpec Spec() {
 
 class ClientWithoutMemory : public testing::TestWithParam<Shortage> {
 protected:
-  const int m_step = Repetitions(1, 13);
   const ScriptedServer m_server{AnswerWithAToken};
 };
 
@@ -126,7 +124,7 @@ TEST_P(ClientWithoutMemory, HasOneOutcomeForEachOperation) {
   const SsoClient::CancelSource cancel;
   SsoClient::CallOptions options = SsoClient::CallOptions::WithTimeout(std::chrono::minutes(10));
   options.cancelToken = cancel.GetToken();
-  ExpectOneOutcomeWhereverMemoryRunsOut(GetParam(), m_server.GetPort(), m_step, [&](OutcomeNote &note) {
+  ExpectOneOutcomeWhereverMemoryRunsOut(GetParam(), m_server.GetPort(), [&](OutcomeNote &note) {
     client.AcquireAsync(credential, spec, options, note.ForToken());
   });
   EXPECT_TRUE(client.Acquire(credential, spec, options));
@@ -141,7 +139,7 @@ TEST_P(ClientWithoutMemory, HasOneOutcomeForEachCallOfASource) {
   };
   renewSource();
   source->Get();
-  ExpectOneOutcomeWhereverMemoryRunsOut(GetParam(), m_server.GetPort(), m_step, [&](OutcomeNote &note) {
+  ExpectOneOutcomeWhereverMemoryRunsOut(GetParam(), m_server.GetPort(), [&](OutcomeNote &note) {
     renewSource();
     source->GetAsync({}, note.ForToken());
   });

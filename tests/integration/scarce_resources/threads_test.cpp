@@ -3,7 +3,10 @@
 #include "outcome.h"
 
 #include "support/data_file.h"
+#include "support/operation_forms.h"
 #include "support/posting_server.h"
+#include "support/process_resources.h"
+#include "support/service_stand_ins.h"
 #include "support/soap_responses.h"
 
 #include <tarvel/system/stream.h>
@@ -53,12 +56,16 @@ public:
   void AllowAllThreads() { g_threadsLeft = 1000000; }
 
   /// A client that reaches the service by `host`: its address or its name.
-  ServicePtr GetService(const std::string &host = "127.0.0.1") const {
-    std::string url = m_server.GetUrl();
-    return ServiceAt(url.replace(url.find("localhost"), 9, host));
-  }
+  ServicePtr GetService(const std::string &host = "127.0.0.1") const { return ServiceAt(GetUrl(host)); }
+  /// The configuration of a client that reaches it by its address.
+  SsoClient::SecurityTokenServiceConfig GetConfig() const { return ConfigFor(GetUrl("127.0.0.1")); }
 
 private:
+  std::string GetUrl(const std::string &host) const {
+    std::string url = m_server.GetUrl();
+    return url.replace(url.find("localhost"), 9, host);
+  }
+
   const PostingServer m_server{std::vector<std::string>(10, IssueResponse(ReadDataFile("tokens/bearer.xml")))};
 };
 
@@ -127,6 +134,77 @@ TEST(NoThreadDeathTest, FailsTheConnectThatNeedsTheResolver) {
   const std::string failure = "SsoClient::CommunicationException: Cannot connect to localhost:: "
                               "Cannot start a thread: Resource temporarily unavailable\n";
   EXPECT_EXIT(ReportWithoutLookupThread(), testing::ExitedWithCode(0), testing::Eq(ALICE + failure + failure + ALICE));
+}
+
+/// The outcome of each form, one on each line. For an exception that the start throws, the text begins with "thrown ".
+std::string OutcomesOfForms(const SsoClient::TokenClient &client) {
+  const SsoClient::Credential credential = SsoClient::PasswordCredential{"alice", Tarvel::SecretText("secret")};
+  std::string outcomes;
+  for (const Form form : AllForms()) {
+    try {
+      outcomes += Acquire(form, client, credential, SpecFor(3600))->GetSubject().ToString() + "\n";
+    } catch (const Tarvel::InvalidStateException &failure) {
+      outcomes += std::string("Tarvel::InvalidStateException: ") + failure.what() + "\n";
+    } catch (const std::exception &failure) {
+      outcomes += std::string("another exception: ") + failure.what() + "\n";
+    }
+  }
+  return outcomes;
+}
+
+[[noreturn]] void ReportClientWithoutThread() {
+  ServiceWorld world;
+  const SsoClient::TokenClient client(world.GetConfig());
+  world.AllowThreads(0);
+  std::cerr << OutcomesOfForms(client);
+  world.AllowAllThreads();
+  std::cerr << OutcomesOfForms(client);
+  std::_Exit(0);
+}
+
+TEST(NoThreadDeathTest, FailsEachFormOfTheClientUntilThereIsOne) {
+  testing::FLAGS_gtest_death_test_style = "threadsafe";
+  std::string failures;
+  std::string successes;
+  for (std::size_t i = 0; i < AllForms().size(); ++i) {
+    failures += NO_THREAD;
+    successes += ALICE;
+  }
+  EXPECT_EXIT(ReportClientWithoutThread(), testing::ExitedWithCode(0), testing::Eq(failures + successes));
+}
+
+[[noreturn]] void ReportSourceWithoutThread() {
+  ServiceWorld world;
+  SsoClient::TokenSourceOptions options;
+  options.firstBackOff = options.longestBackOff = std::chrono::milliseconds(1);
+  const SsoClient::TokenSource source(
+      std::make_shared<const SsoClient::TokenClient>(world.GetConfig()),
+      []() -> SsoClient::Credential {
+        return SsoClient::PasswordCredential{"alice", Tarvel::SecretText("secret")};
+      },
+      SpecFor(3600), options);
+  world.AllowThreads(0);
+  try {
+    source.Get();
+  } catch (const std::exception &failure) {
+    std::cerr << failure.what() << "\n";
+  }
+  world.AllowAllThreads();
+  const bool hasToken = Eventually([&source] {
+    try {
+      return source.Get() != nullptr;
+    } catch (const Tarvel::InvalidStateException &) { // within the back-off
+      return false;
+    }
+  });
+  std::cerr << (hasToken ? "a token\n" : "no token\n");
+  std::_Exit(0);
+}
+
+TEST(NoThreadDeathTest, FailsATokenSourceUntilThereIsOne) {
+  testing::FLAGS_gtest_death_test_style = "threadsafe";
+  EXPECT_EXIT(ReportSourceWithoutThread(), testing::ExitedWithCode(0),
+              testing::Eq("Cannot start a thread: Resource temporarily unavailable\na token\n"));
 }
 
 } // namespace
