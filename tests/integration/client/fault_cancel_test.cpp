@@ -110,7 +110,7 @@ TEST_P(SilentService, IsLeftAtTheDeadline) {
   int operations = 0;
   for (const Form form : AllForms()) {
     ++operations;
-    EXPECT_EQ(Start(form, CallOptions::WithTimeout(IS_SANITIZED ? 500ms : 50ms)).get(), LATE) << NameOf(form);
+    EXPECT_EQ(Start(form, CallOptions::WithTimeout(50ms)).get(), LATE) << NameOf(form);
   }
   // A deadline may pass before the connection is at the stage.
   EXPECT_TRUE(Eventually([this] { return m_service.GetServer().GetOpenCount() == 0; }));
@@ -158,7 +158,7 @@ TEST_P(DrippingService, IsLeftWhenTheOperationIsCancelled) {
 
 TEST_P(DrippingService, IsLeftAtTheDeadline) {
   for (const Form form : AllForms()) {
-    const CallOptions options = CallOptions::WithTimeout(IS_SANITIZED ? 500ms : 50ms);
+    const CallOptions options = CallOptions::WithTimeout(50ms);
     EXPECT_EQ(OutcomeOf([&] { return Acquire(form, *m_client, AnyCredential(), AnySpec(), options); }), LATE)
         << NameOf(form);
   }

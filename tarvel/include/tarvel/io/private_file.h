@@ -68,7 +68,7 @@ public:
   /// @throws IOException when the file is refused or cannot be read; std::bad_alloc
   boost::optional<std::string> Read() const;
 
-  /// Makes the file, empty, if there is none, and takes its lock; null when another holder has the lock, in this process or in
+  /// Makes an empty file if there is no file, and takes the lock; null when another holder has the lock, in this process or in
   /// another one. Does not wait for that holder.
   /// @throws IOException when the file is refused, or cannot be made or locked; std::bad_alloc
   std::unique_ptr<PrivateFileLock> TryLock() const;
