@@ -46,7 +46,7 @@ constexpr Command COMMANDS[] = {
      "  ssoclient token --cache alice.cache --sts https://sts.corp.example/sts --ca ca.pem --trust sts.pem \\\n"
      "      --user alice@corp.example --password-file password.txt\n"
      "  ssoclient token --cache client.cache --sts https://sts.corp.example/sts --ca ca.pem --trust sts.pem \\\n"
-     "      --cert client.pem --key client.key --timeout 10 --out client.xml --force\n",
+     "      --cert client.pem --key client.key --timeout 10\n",
      Format::XML, DefineToken},
     {"renew", "Ask the service for a new token to replace a renewable one",
      "  ssoclient renew --sts https://sts.corp.example/sts --ca ca.pem --trust sts.pem \\\n"
