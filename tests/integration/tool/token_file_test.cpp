@@ -135,10 +135,9 @@ TEST_F(TokenFile, IsWrittenWholeWhenASignalArrivesDuringTheWrite) {
 }
 
 TEST_F(TokenFile, IsNotCreatedWhenASecondSignalArrivesDuringTheWrite) {
-  const Result result = Run("SIGNAL_AT_FSYNC=" + std::to_string(SIGINT) +
-                            " SECOND_SIGNAL_AT_FSYNC=" + std::to_string(SIGTERM) +
-                            " ASAN_OPTIONS=verify_asan_link_order=0 LD_PRELOAD=" + InterruptingFsyncPath() + " exec " +
-                            Line());
+  const Result result =
+      Run("SIGNAL_AT_FSYNC=" + std::to_string(SIGINT) + " SECOND_SIGNAL_AT_FSYNC=" + std::to_string(SIGTERM) +
+          " ASAN_OPTIONS=verify_asan_link_order=0 LD_PRELOAD=" + InterruptingFsyncPath() + " exec " + Line());
   EXPECT_EQ(130, result.exitCode);
   EXPECT_EQ(m_before, m_folder.Names());
 }
