@@ -47,7 +47,7 @@ void AwaitCacheFile(const std::string &path) {
   constexpr int PATIENCE = 1000;
   constexpr useconds_t TURN_MICROSECONDS = 1000;
   const std::string replacement = path + ".new"; // see `Tarvel::PrivateFileLock::Replace`
-  const UnfinishedFile unfinished([&replacement] { return replacement; });
+  const UnfinishedFile unfinished([&path] { return path + ".new"; });
   const auto exists = [&replacement] {
     struct stat status = {};
     return lstat(replacement.c_str(), &status) == 0;

@@ -46,7 +46,7 @@ constexpr Command COMMANDS[] = {
      "  ssoclient token --cache alice.cache --sts https://sts.corp.example/sts --ca ca.pem --trust sts.pem \\\n"
      "      --user alice@corp.example --password-file password.txt\n"
      "  ssoclient token --cache client.cache --sts https://sts.corp.example/sts --ca ca.pem --trust sts.pem \\\n"
-     "      --cert client.pem --key client.key --timeout 10 --out client.xml --force\n",
+     "      --cert client.pem --key client.key --timeout 10\n",
      Format::XML, DefineToken},
     {"renew", "Ask the service for a new token to replace a renewable one",
      "  ssoclient renew --sts https://sts.corp.example/sts --ca ca.pem --trust sts.pem \\\n"
@@ -144,8 +144,15 @@ std::string Explain(const CLI::App &app, const CLI::ParseError &error) {
   return message;
 }
 
-void AddCommonOptions(CLI::App &app, Format format, OutputOptions &output,
-                      boost::optional<std::chrono::microseconds> &timeout) {
+/// The options of every command.
+struct CommonOptions {
+  OutputOptions output;
+  boost::optional<std::chrono::microseconds> timeout;
+  bool usesSystemCrypto = false;
+};
+
+void AddCommonOptions(CLI::App &app, Format format, CommonOptions &options) {
+  OutputOptions &output = options.output;
   static const std::map<std::string, Format> FORMATS = {
       {"text", Format::TEXT}, {"json", Format::JSON}, {"xml", Format::XML}};
   app.add_option_function<std::string>(
@@ -156,19 +163,15 @@ void AddCommonOptions(CLI::App &app, Format format, OutputOptions &output,
       ->default_str(format == Format::XML ? "xml" : "text")
       ->type_name("FORMAT");
   AddOption(
-      app, "--timeout", timeout,
+      app, "--timeout", options.timeout,
       "How long the command may take, such as 2.5; then it ends with exit code 4. By default, it may take any time; "
       "a request may take four minutes")
       .TypeName("SECONDS");
   AddFlag(app, "-v,--verbose", output.verbose,
           "Write log lines, and the requests and responses without their content, to standard error; and warnings even "
           "when the format is json");
-}
-
-void ShowLog(bool isVerbose) {
-  if (isVerbose) {
-    ShowLibraryLog();
-  }
+  app.add_flag("--system-crypto", options.usesSystemCrypto,
+               "Use OpenSSL as this machine configures it, with its providers (FIPS, PKCS#11) and TLS settings");
 }
 
 int Run(int argc, char **argv) {
@@ -178,23 +181,20 @@ int Run(int argc, char **argv) {
   app.footer(ExitCodeHelp());
   app.require_subcommand(1);
 
-  OutputOptions output;
-  boost::optional<std::chrono::microseconds> timeout;
-  bool usesSystemCrypto = false;
+  CommonOptions options;
+  OutputOptions &output = options.output;
   Action chosen;
   for (const Command &command : COMMANDS) {
     CLI::App *sub = app.add_subcommand(command.name, command.summary);
     sub->footer(std::string("Examples:\n") + command.examples);
     const Action action = command.define(*sub, output);
-    AddCommonOptions(*sub, command.format, output, timeout);
+    AddCommonOptions(*sub, command.format, options);
     sub->final_callback([&chosen, &output, action, sub, format = command.format] {
       chosen = action;
       if (sub->count("--format") == 0) {
         output.format = format;
       }
     });
-    sub->add_flag("--system-crypto", usesSystemCrypto,
-                  "Use OpenSSL as this machine configures it, with its providers (FIPS, PKCS#11) and TLS settings");
   }
 
   try {
@@ -204,9 +204,11 @@ int Run(int argc, char **argv) {
   } catch (const CLI::ParseError &error) {
     throw UsageException(Explain(app, error) + "; see ssoclient --help");
   }
-  WatchCommand(timeout, output.format);
-  ShowLog(output.verbose);
-  if (usesSystemCrypto) {
+  WatchCommand(options.timeout, output.format);
+  if (output.verbose) {
+    ShowLibraryLog();
+  }
+  if (options.usesSystemCrypto) {
     Tarvel::Crypto::UseSystemConfiguration();
   }
   return static_cast<int>(chosen());

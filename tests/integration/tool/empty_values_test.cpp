@@ -17,7 +17,7 @@ namespace {
 
 using testing::IsSupersetOf;
 
-const char *const COMMANDS[] = {"acquire", "renew", "validate", "verify", "inspect", "doctor", "dialect"};
+const char *const COMMANDS[] = {"acquire", "token", "renew", "validate", "verify", "inspect", "doctor", "dialect"};
 
 class EmptyValue : public testing::TestWithParam<const char *> {};
 

@@ -133,6 +133,13 @@ TEST_F(Ending, OfTheDoctorComesInTimeWhileItReadsAFile) {
   ExpectResult(Run("ssoclient doctor --sts https://127.0.0.1:9/ --ca fifo --timeout 0.3"), 4, "", LATE);
 }
 
+TEST_F(Ending, DoesNotComeAtASignalThatIsIgnored) {
+  TerminalSession session(ShellCommand("trap '' INT; exec ssoclient inspect --timeout 1 fifo"), m_folder.Path());
+  session.WaitUntilItBlocks(SIGTERM);
+  session.Signal(SIGINT);
+  EXPECT_EQ(4, session.Finish());
+}
+
 TEST_F(Ending, AtATimeOutOfRangeIsRefused) {
   for (const char *timeout : {"0", "0.0009", "86400.001", "1e3", "-1", "5.", ".5", "1 ", "99999999999999999999"}) {
     ExpectResult(
