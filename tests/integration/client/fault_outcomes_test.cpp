@@ -3,8 +3,8 @@
 // one of `SecurityTokenService`, in each form, and the next operation works.
 
 #include "integration/client/fault_service.h"
-#include "support/operation_forms.h"
 #include "support/data_file.h"
+#include "support/operation_forms.h"
 #include "support/soap_responses.h"
 #include "support/unavailable_port.h"
 
