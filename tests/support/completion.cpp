@@ -62,7 +62,9 @@ bool DrainIoThreads() {
                                      [&meeting] { return meeting->present == Tarvel::System::IO_THREADS + 1; });
   };
   for (std::size_t thread = 0; thread < Tarvel::System::IO_THREADS; ++thread) {
-    boost::asio::post(Tarvel::System::GetIoContextOf(thread), attend);
+    // Twice, because what a handler posts on its own thread is queued only when the handler has returned.
+    boost::asio::io_context &context = Tarvel::System::GetIoContextOf(thread);
+    boost::asio::post(context, [&context, attend] { boost::asio::post(context, attend); });
   }
   return attend();
 }

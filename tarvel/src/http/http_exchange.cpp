@@ -109,7 +109,6 @@ void HttpExchange::OnConnected(const Ref<System::Stream> &stream, const Exceptio
     }
     m_connecting.reset();
     m_stream = stream;
-    m_hasConnected = stream && !failure;
     isCancelled = m_isCancelled;
   }
   if (isCancelled) {
@@ -136,6 +135,10 @@ void HttpExchange::Send(const Ref<System::Stream> &stream) {
                         m_cookies->GetHeader(m_spec->GetHost(), m_request.target, m_isSecure));
   m_request.body = SecretText();
   const std::string &message = m_message.Get();
+  {
+    const std::lock_guard<ForkSafeMutex> lock(m_mutex);
+    m_hasConnected = true; // even if the write fails: it may have sent a part
+  }
   stream->AsyncWrite(message.data(), message.size(), [self = Ref(this)](std::size_t, const Exception *failure) {
     self->RunGuarded([&self, failure] { self->OnWritten(failure); });
   });

@@ -102,6 +102,9 @@ void SSLStreamImpl::Pump(Completions &done) {
   bool waits = false;
   if (m_stage == Stage::HANDSHAKING) {
     waits = StepHandshake(done);
+    if (m_stage == Stage::ESTABLISHED && !m_write) {
+      return; // the step that `StepHandshake` has posted sends the rest of the handshake
+    }
   }
   if (m_stage == Stage::ESTABLISHED && m_write) {
     StepWrite(done);
@@ -130,6 +133,8 @@ bool SSLStreamImpl::StepHandshake(Completions &done) {
   if (progress != Progress::DONE) {
     return WaitsForBytes(progress, done);
   }
+  // The handler probably writes. The next step runs after it, and sends the handshake's last message together with that.
+  PostPump();
   m_wasResumed = m_tls.WasResumed();
   m_stage = Stage::ESTABLISHED;
   m_tls.KeepResumedSession();

@@ -112,6 +112,7 @@ public:
     stream->AsyncHandshake("localhost", "", handshake.ForEnd());
     EXPECT_TRUE(handshake.Wait());
     // The client's part of the handshake ends before its last message is written, for which the server waits.
+    EXPECT_TRUE(Testing::DrainIoThreads());
     EXPECT_TRUE(Testing::Eventually([&lower] { return !lower->IsWriting(); }));
     lower->Break();
   }
