@@ -14,6 +14,7 @@ ssoclient_mark(30 in_full
   PrefixesOfDocuments.AreReadAlikeByAllReaders
   GeneratedDocuments.AreReadAlikeByAllReadersExceptForNamedDifferences)
 ssoclient_mark(20 in_full
+  TokenSourceModel.DoesTheSameAsTheSourceAfterEachOfManyRandomEvents
   PositionOfRefusal.IsOnTheLineThatLibxml2ReportsExceptForNamedDifferences
   PositionOfRefusal.IsAfterTextThatAWellFormedDocumentMayBeginWith
   DocumentBetweenGuardPages.IsReadAsElsewhere
@@ -21,5 +22,7 @@ ssoclient_mark(20 in_full
   Over/ManyAcquisitions.AreUnderWayAtOnceOnFewThreadsInLittleMemoryAndAllAreRight/Tls
   Over/ManyAcquisitions.AllEndWhenTheyAreCancelledAndCloseTheirConnections/Tls
   Over/ManyAcquisitions.AllEndWhenTheirClientIsDestroyed/Tls
+  Over/ClientSoak.HasOneOutcomeForEachOperationAndDoesNotGrow/Tcp
+  Over/ClientSoak.HasOneOutcomeForEachOperationAndDoesNotGrow/Tls
   OneServiceOnSixteenThreads.ComposesReadsAndVerifiesTwentyThousandTimesWithoutErrorOrGrowth
   Of/Truncation.EveryPrefixIsRefusedByTheParser/bearer_50k)

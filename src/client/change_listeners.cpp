@@ -75,7 +75,7 @@ void ChangeListeners::RunNext() {
 }
 
 void ChangeListeners::Close() noexcept {
-  std::deque<Call> dropped;
+  std::list<Call> dropped;
   const std::lock_guard<Tarvel::ForkSafeMutex> lock(m_mutex);
   dropped.swap(m_calls);
   m_isClosed = true;

@@ -7,7 +7,7 @@
 #include <ssoclient/client/token_source.h>
 #include <tarvel/core/fork_safe_mutex.h>
 
-#include <deque>
+#include <list>
 #include <functional>
 #include <memory>
 #include <utility>
@@ -46,7 +46,7 @@ private:
   const Executor m_executor;
   Tarvel::ForkSafeMutex m_mutex; // guards all that follows
   std::vector<Entry> m_entries;
-  std::deque<Call> m_calls;
+  std::list<Call> m_calls;
   bool m_isRunning = false;
   bool m_isClosed = false;
 };

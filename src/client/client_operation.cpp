@@ -48,8 +48,8 @@ ClientOperation::ClientOperation(std::shared_ptr<ClientCore> core, ClientTask ta
       m_kind(KindOf(task)), m_deadline(options.deadline),
       m_retryPolicy(options.retryPolicy.value_or(m_core->GetOptions().retryPolicy)),
       m_executor(options.executor ? options.executor : m_core->GetOptions().executor),
-      m_cancelToken(options.cancelToken), m_frame(std::make_unique<const OperationFrame>(NameOf(task), "TokenClient")),
-      m_events(m_observer.get(), NameOf(task), m_frame->GetId()) {
+      m_cancelToken(options.cancelToken), m_frame(NameOf(task), "TokenClient"),
+      m_events(m_observer.get(), NameOf(task), m_frame.GetId()) {
   try {
     CheckRetryPolicy(m_retryPolicy);
     m_steps = m_core->GetSteps(options);
@@ -104,17 +104,22 @@ bool ClientOperation::WaitForChange(std::unique_lock<ForkSafeMutex> &lock) {
     m_waiter->changed.wait(lock);
     return true;
   }
-  return m_waiter->changed.wait_until(lock, limit) == std::cv_status::no_timeout;
+  const Clock::duration remaining = limit - m_core->GetTime().GetSteadyTime();
+  return m_waiter->changed.wait_until(lock, Clock::now() + remaining) == std::cv_status::no_timeout;
 }
 
 void ClientOperation::OnWaitLimit() noexcept {
-  if (m_deadline && Clock::now() >= *m_deadline) {
+  const Clock::time_point now = m_core->GetTime().GetSteadyTime();
+  if (m_deadline && now >= *m_deadline) {
     Cancel(Late());
     return;
   }
   unsigned exchange = 0;
   {
     const std::lock_guard<ForkSafeMutex> lock(m_mutex);
+    if (now < m_messageEnd) {
+      return;
+    }
     exchange = m_exchange;
   }
   OnMessageLimit(exchange);
@@ -303,7 +308,7 @@ void ClientOperation::Deliver(bool isOnComputePool) noexcept {
   if (IsOfParent()) {
     return; // the observer has forked
   }
-  m_frame.reset();
+  m_frame.LogEnd();
   if (m_waiter) {
     const std::lock_guard<ForkSafeMutex> lock(m_mutex);
     m_waiter->isOver = true;

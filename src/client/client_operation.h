@@ -37,9 +37,9 @@ struct OperationEnding {
 /// so no thread is held while the network is waited for.
 ///
 /// Cancelling, the deadline, the end of the client and the regular end compete to decide how it ends; the first one wins,
-/// and the others do nothing. A step that runs at this moment goes on without effect: nothing is sent or reported after the
-/// decision. The observer's `OnEnded` comes before the outcome. What is secret is released at the decision, or, if a step
-/// uses it, at the end of that step.
+/// and the others do nothing. A step that runs at this moment goes on without effect: it sends nothing more, and no step
+/// follows. The observer's `OnEnded` comes before the outcome, and no event comes after it. What is secret is released at the
+/// decision, or, if a step uses it, at the end of that step.
 ///
 /// In a child of `fork`, the operations of the parent do nothing.
 class ClientOperation final : public std::enable_shared_from_this<ClientOperation>, private EventsEndListener {
@@ -119,7 +119,7 @@ private:
   static OperationEnding EndWithToken(std::shared_ptr<const SamlToken> token);
   void ForgetTask() noexcept;
   void Send(Request request);
-  void StartMessageLimit(unsigned exchange);
+  void StartMessageLimit(unsigned exchange, Clock::time_point end);
   void KeepRequest(unsigned exchange, Item item) noexcept;
   void OnResponse(const Tarvel::Exception *failure, Tarvel::Reader *response) noexcept;
   void OnMessageLimit(unsigned exchange) noexcept;
@@ -160,7 +160,7 @@ private:
   const RetryPolicy m_retryPolicy;
   const Executor m_executor;
   CancelToken m_cancelToken;
-  std::unique_ptr<const OperationFrame> m_frame;
+  OperationFrame m_frame;
   OperationEvents m_events;
 
   // Used by the step that runs.

@@ -7,6 +7,8 @@
 #include <ssoclient/exceptions.h>
 
 #include <algorithm>
+#include <chrono>
+#include <cstdint>
 #include <mutex>
 #include <random>
 #include <utility>
@@ -55,9 +57,12 @@ struct TransportFailure {
   bool isCommunication = false;
 };
 
-double GetRandom() {
-  std::random_device device;
-  return static_cast<double>(device()) / static_cast<double>(std::random_device::max());
+/// From 0 to 1; different in programs that start at the same time. Never throws, unlike `std::random_device`.
+double GetRandom(const void *object) {
+  const auto now = static_cast<std::uint64_t>(std::chrono::steady_clock::now().time_since_epoch().count());
+  std::minstd_rand generator(static_cast<std::uint32_t>(now ^ reinterpret_cast<std::uintptr_t>(object)));
+  generator.discard(1); // the first number of similar seeds is similar
+  return std::uniform_real_distribution<double>()(generator);
 }
 
 } // namespace
@@ -84,6 +89,9 @@ boost::optional<OperationEnding> ClientOperation::AskHandler() {
     TokenSteps::LogNegotiation(acquisition.spec);
     CheckRequired(static_cast<bool>(credential.makeHandler));
     m_secrets.handler = credential.makeHandler();
+    if (IsDecided()) {
+      return boost::none;
+    }
   }
   NegotiationHandler &handler = Required(m_secrets.handler);
   SPNegoResponse &spnego = m_secrets.spnego;
@@ -117,13 +125,14 @@ void ClientOperation::Send(Request request) {
   const std::shared_ptr<TransportSession> session = m_session;
   m_events.BeginExchange(request);
   unsigned exchange = 0;
+  Clock::time_point end;
   {
     const std::lock_guard<ForkSafeMutex> lock(m_mutex);
     if (m_isDecided || IsOfParent()) {
       return;
     }
     exchange = ++m_exchange;
-    m_messageEnd = m_core->GetTime().GetSteadyTime() + session->GetTimeout();
+    m_messageEnd = end = m_core->GetTime().GetSteadyTime() + session->GetTimeout();
     m_held.session = session;
     m_isLate = false;
     if (m_waiter) {
@@ -132,7 +141,7 @@ void ClientOperation::Send(Request request) {
   }
   Item item;
   try {
-    StartMessageLimit(exchange);
+    StartMessageLimit(exchange, end);
     session->SendRequestAsync(
         request,
         [self = shared_from_this()](const Tarvel::Exception *failure, Tarvel::Reader *response) {
@@ -146,8 +155,7 @@ void ClientOperation::Send(Request request) {
   KeepRequest(exchange, item);
 }
 
-void ClientOperation::StartMessageLimit(unsigned exchange) {
-  const Clock::time_point end = m_messageEnd;
+void ClientOperation::StartMessageLimit(unsigned exchange, Clock::time_point end) {
   if (m_waiter || (m_deadline && *m_deadline <= end)) {
     return;
   }
@@ -201,8 +209,9 @@ void ClientOperation::KeepRequest(unsigned exchange, Item item) noexcept {
 
 /// Runs on an I/O thread.
 void ClientOperation::OnResponse(const Tarvel::Exception *failure, Tarvel::Reader *response) noexcept {
-  Item request; // released outside the lock
+  Item request; // what is swapped is released outside the lock
   Item limit;
+  std::shared_ptr<TransportSession> session;
   if (!BeginStep()) {
     return;
   }
@@ -212,6 +221,7 @@ void ClientOperation::OnResponse(const Tarvel::Exception *failure, Tarvel::Reade
     m_messageEnd = Clock::time_point::max();
     std::swap(request, m_held.request);
     std::swap(limit, m_held.messageLimit);
+    session.swap(m_held.session);
   }
   if (limit) {
     limit->Cancel();
@@ -283,7 +293,7 @@ bool ClientOperation::RetryLater() {
   }
   const TimeSource &time = m_core->GetTime();
   const boost::optional<milliseconds> delay =
-      GetRetryDelay(m_retryPolicy, m_attempt, *m_facts, time.GetSystemTime(), GetRandom());
+      GetRetryDelay(m_retryPolicy, m_attempt, *m_facts, time.GetSystemTime(), GetRandom(this));
   if (!delay) {
     return false;
   }

@@ -147,8 +147,13 @@ boost::optional<RefreshState::SteadyTime> RefreshState::GetTimer(const Moment &n
   }
   // A due token that no caller asks for is not refreshed, but it ends. If the clock has been set and the token is not usable,
   // it may become usable again.
-  const SteadyTime next = std::max(m_times.steadyDueAt, m_notBefore);
-  return m_isAttempting || next <= now.steady ? m_times.steadyUntil : std::min(next, m_times.steadyUntil);
+  SteadyTime next = m_times.steadyUntil;
+  for (const SteadyTime time : {m_times.steadyDueAt, m_notBefore}) {
+    if (!m_isAttempting && time > now.steady) {
+      next = std::min(next, time);
+    }
+  }
+  return next;
 }
 
 } // namespace SsoClient

@@ -5,6 +5,8 @@
 #include <ssoclient/logger.h>
 #include <tarvel/core/string_util.h>
 
+#include <utility>
+
 namespace SsoClient {
 
 using Tarvel::Service::LogInternal;
@@ -14,9 +16,13 @@ OperationFrame::OperationFrame(const std::string &operationName, const char *cla
   LogInternal(getLogger(), LOG_LEVEL_OPERATION, "opId=%1 START operation %2::%3", m_opId, m_className, m_operationName);
 }
 
-OperationFrame::~OperationFrame() {
+void OperationFrame::LogEnd() noexcept {
+  const char *const className = std::exchange(m_className, nullptr);
+  if (!className) {
+    return;
+  }
   try {
-    LogInternal(getLogger(), LOG_LEVEL_OPERATION, "opId=%1 END operation %2::%3", m_opId, m_className, m_operationName);
+    LogInternal(getLogger(), LOG_LEVEL_OPERATION, "opId=%1 END operation %2::%3", m_opId, className, m_operationName);
   } catch (...) {
     // Out of memory: the line is lost, but the outcome of the operation is not.
   }

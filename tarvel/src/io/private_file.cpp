@@ -244,14 +244,31 @@ private:
   OwnedDescriptor m_file; // released when it has the final path
 };
 
-/// Makes the new name permanent. Some file systems cannot, and then a loss of power may bring the old content back.
-void SynchroniseFolderOf(const std::string &path) {
+std::string FolderOf(const std::string &path) {
   const std::size_t slash = path.rfind('/');
-  const std::string folder = slash == std::string::npos ? "." : path.substr(0, slash + 1);
+  return slash == std::string::npos ? "." : path.substr(0, slash + 1);
+}
+
+/// Makes new names in the folder permanent. Some file systems cannot, and then a loss of power may bring the old content back.
+void SynchroniseFolder(const std::string &folder) noexcept {
   const OwnedDescriptor opened(
       Uninterrupted([&] { return ::open(folder.c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC); }));
   if (opened.IsOpen()) {
     Uninterrupted([&] { return ::fsync(opened.Get()); });
+  }
+}
+
+/// Closes the locked file. A child has a copy of the descriptor, so that closing it in the parent would not be enough.
+void ReleaseLock(int descriptor, unsigned generation) noexcept {
+  if (generation == GetForkGeneration()) {
+    ::flock(descriptor, LOCK_UN);
+  }
+  ::close(descriptor);
+}
+
+void RequireOwnLock(unsigned generation, const std::string &path) {
+  if (generation != GetForkGeneration()) {
+    throw InvalidStateException("The lock of " + StringUtil::Shorten(path) + " belongs to the parent process");
   }
 }
 
@@ -264,43 +281,30 @@ PrivateFileLock::PrivateFileLock(std::string path, int descriptor) noexcept
 }
 
 PrivateFileLock::~PrivateFileLock() {
-  Release();
-}
-
-// A child has a copy of the descriptor, so that closing it in the parent would not be enough.
-void PrivateFileLock::Release() noexcept {
-  if (m_generation == GetForkGeneration()) {
-    ::flock(m_descriptor, LOCK_UN);
-  }
-  ::close(m_descriptor);
-}
-
-void PrivateFileLock::RequireOwnProcess() const {
-  if (m_generation != GetForkGeneration()) {
-    throw InvalidStateException("The lock of " + StringUtil::Shorten(m_path) + " belongs to the parent process");
-  }
+  ReleaseLock(m_descriptor, m_generation);
 }
 
 std::string PrivateFileLock::Read() const {
-  RequireOwnProcess();
+  RequireOwnLock(m_generation, m_path);
   return ReadContent(m_descriptor, m_path);
 }
 
 void PrivateFileLock::Replace(std::string_view content) {
-  RequireOwnProcess();
+  RequireOwnLock(m_generation, m_path);
   if (content.size() > PrivateFile::MAX_BYTES) {
     Fail("write", m_path, "the content is larger than 32 MiB");
   }
+  const std::string folder = FolderOf(m_path);
   Replacement replacement(m_path);
   replacement.Write(content);
   const int descriptor = replacement.Publish();
-  Release();
+  ReleaseLock(m_descriptor, m_generation);
   m_descriptor = descriptor;
-  SynchroniseFolderOf(m_path);
+  SynchroniseFolder(folder);
 }
 
 void PrivateFileLock::Clear() {
-  RequireOwnProcess();
+  RequireOwnLock(m_generation, m_path);
   if (Uninterrupted([this] { return ::ftruncate(m_descriptor, 0); }) != 0 ||
       Uninterrupted([this] { return ::fsync(m_descriptor); }) != 0) {
     FailWith(errno, "write", m_path);

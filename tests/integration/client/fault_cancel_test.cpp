@@ -130,7 +130,7 @@ TEST_P(SilentService, IsLeftWhenTheClientIsDestroyed) {
 }
 
 INSTANTIATE_TEST_SUITE_P(At, SilentService, testing::ValuesIn(STAGES),
-                         [](const testing::TestParamInfo<Stage> &info) { return info.param.name; });
+                         [](const testing::TestParamInfo<Stage> &test) { return test.param.name; });
 
 /// A service that sends its answer byte by byte, each of which would extend a time-out that counts from the last one.
 class DrippingService : public testing::TestWithParam<bool> {
@@ -165,8 +165,8 @@ TEST_P(DrippingService, IsLeftAtTheDeadline) {
   EXPECT_TRUE(Eventually([this] { return m_service.GetServer().GetOpenCount() == 0; }));
 }
 
-INSTANTIATE_TEST_SUITE_P(Over, DrippingService, testing::Bool(), [](const testing::TestParamInfo<bool> &info) {
-  return std::string(info.param ? "Tls" : "Tcp");
+INSTANTIATE_TEST_SUITE_P(Over, DrippingService, testing::Bool(), [](const testing::TestParamInfo<bool> &test) {
+  return std::string(test.param ? "Tls" : "Tcp");
 });
 
 class ClientConnections : public testing::TestWithParam<bool> {};
@@ -228,8 +228,8 @@ TEST_P(ClientConnections, LeaveNoDescriptorAndNoThreadAfterTwoThousandCancels) {
   EXPECT_TRUE(Eventually([&] { return CountThreads() <= threads; })) << CountThreads() << " " << threads;
 }
 
-INSTANTIATE_TEST_SUITE_P(Over, ClientConnections, testing::Bool(), [](const testing::TestParamInfo<bool> &info) {
-  return std::string(info.param ? "Tls" : "Tcp");
+INSTANTIATE_TEST_SUITE_P(Over, ClientConnections, testing::Bool(), [](const testing::TestParamInfo<bool> &test) {
+  return std::string(test.param ? "Tls" : "Tcp");
 });
 
 /// A resolver that gives no answer before it is released.

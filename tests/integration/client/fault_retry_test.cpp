@@ -3,6 +3,7 @@
 
 #include "integration/client/fault_service.h"
 #include "support/operation_forms.h"
+#include "support/process_resources.h"
 #include "support/unavailable_port.h"
 #include "system/name_lookup.h"
 
@@ -41,6 +42,9 @@ CallOptions With(const RetryPolicy &policy) {
 }
 
 constexpr const char *DOWN = "CommunicationException: Server returned error: 503 Down";
+
+constexpr const char *EMPTY =
+    "SsoException: Response is not well-formed XML: the document is empty at line 1, column 1";
 
 std::string Unavailable(const std::string &retryAfter) {
   return HttpResponse("503 Down", "", "Retry-After: " + retryAfter + "\r\n");
@@ -87,19 +91,17 @@ const Answer ANSWERS[] = {
     {"Words", Unavailable("soon"), 1, DOWN},
     {"Empty", Unavailable(""), 1, DOWN},
     {"Missing", HttpResponse("503 Down", ""), 1, DOWN},
-    {"OfAnotherStatus", HttpResponse("500 Internal Server Error", "", "Retry-After: 0\r\n"), 1,
-     "SsoException: An error occurred while parsing the response"},
+    {"OfAnotherStatus", HttpResponse("500 Internal Server Error", "", "Retry-After: 0\r\n"), 1, EMPTY},
     {"OfARedirect", HttpResponse("302 Found", "", "Retry-After: 0\r\n"), 1,
      "CommunicationException: Server returned error: 302 Found"},
     {"OfTooManyRequests", HttpResponse("429 Slow Down", "", "Retry-After: 0\r\n"), 1,
      "CommunicationException: Server returned error: 429 Slow Down"},
-    {"OfASuccess", HttpResponse("200 OK", "", "Retry-After: 0\r\n"), 1,
-     "SsoException: An error occurred while parsing the response"},
+    {"OfASuccess", HttpResponse("200 OK", "", "Retry-After: 0\r\n"), 1, EMPTY},
 };
 
 INSTANTIATE_TEST_SUITE_P(Of, RetryAfter, testing::Combine(testing::ValuesIn(ANSWERS), testing::Bool()),
-                         [](const testing::TestParamInfo<std::tuple<Answer, bool>> &info) {
-                           return std::get<0>(info.param).name + (std::get<1>(info.param) ? "OverTls" : "OverTcp");
+                         [](const testing::TestParamInfo<std::tuple<Answer, bool>> &test) {
+                           return std::get<0>(test.param).name + (std::get<1>(test.param) ? "OverTls" : "OverTcp");
                          });
 
 /// The first `unavailable` requests are answered with 503, and the others with a token.
@@ -181,7 +183,10 @@ TEST(RetryPolicyOfAClient, DoesNotRepeatARequestThatTheServiceMayHaveActedUpon) 
       },
       Reply("HTTP/1.1 503 Down\r\nRetry-Af"),
       Reply("this is not HTTP"),
-      [](ServerConnection &peer) { peer.Reset(); },
+      [](ServerConnection &peer) {
+        peer.ReadSome(1);
+        peer.Reset();
+      },
   };
   for (const ScriptedServer::Script &script : scripts) {
     FaultService service(script, false);

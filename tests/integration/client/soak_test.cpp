@@ -162,7 +162,7 @@ private:
 
 class ClientSoak : public testing::TestWithParam<bool> {};
 
-TEST_P(ClientSoak, HasOneOutcomeForEachOfAHundredThousandOperationsAndDoesNotGrow) {
+TEST_P(ClientSoak, HasOneOutcomeForEachOperationAndDoesNotGrow) {
   const int operations = Repetitions(100'000, IS_SANITIZED ? 300 : 1'000);
   constexpr std::size_t TOLERANCE = std::size_t{4} * 1024 * 1024;
   Soak soak(GetParam());
@@ -190,8 +190,8 @@ TEST_P(ClientSoak, HasOneOutcomeForEachOfAHundredThousandOperationsAndDoesNotGro
   RecordProperty("late", soak.CountLate());
 }
 
-INSTANTIATE_TEST_SUITE_P(Over, ClientSoak, testing::Bool(), [](const testing::TestParamInfo<bool> &info) {
-  return std::string(info.param ? "Tls" : "Tcp");
+INSTANTIATE_TEST_SUITE_P(Over, ClientSoak, testing::Bool(), [](const testing::TestParamInfo<bool> &test) {
+  return std::string(test.param ? "Tls" : "Tcp");
 });
 
 } // namespace

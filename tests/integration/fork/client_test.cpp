@@ -5,6 +5,7 @@
 #include "support/forked.h"
 #include "support/operation_forms.h"
 #include "support/rendezvous.h"
+#include "support/throws_message.h"
 
 #include <ssoclient/client/token_client.h>
 #include <ssoclient/client/token_source.h>
@@ -162,7 +163,9 @@ TEST_P(TokenSourceAfterFork, ReturnsTheParentsTokenInTheChild) {
                 EXPECT_EQ(Testing::Get(form, source), token) << NameOf(form);
               }
               source.Invalidate(token->GetId());
-              EXPECT_TRUE(source.Get());
+              EXPECT_THROWS_MESSAGE(source.Get(), SsoException,
+                                    "The service issued a token again that was invalidated: " + token->GetId())
+                  << "the service has only one token";
             }),
             "");
   EXPECT_EQ(source.Get(), token) << "what the child does changes nothing in the parent";

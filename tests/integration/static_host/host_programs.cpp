@@ -14,6 +14,7 @@ namespace Testing {
 const char *const EARLY_HOST_PROGRAM = EARLY_HOST;
 const char *const LATE_HOST_PROGRAM = LATE_HOST;
 const char *const IN_FLIGHT_HOST_PROGRAM = IN_FLIGHT_HOST;
+const char *const CLIENT_IN_FLIGHT_HOST_PROGRAM = CLIENT_IN_FLIGHT_HOST;
 
 std::string RunHost(const char *program, const std::string &environment) {
   const std::string command = "exec env DATA='" + DataPath("") + "' " + environment + " '" + program + "' 2>&1";

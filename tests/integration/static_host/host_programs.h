@@ -14,6 +14,8 @@ extern const char *const EARLY_HOST_PROGRAM;
 extern const char *const LATE_HOST_PROGRAM;
 /// A program that ends while a request over TLS is under way.
 extern const char *const IN_FLIGHT_HOST_PROGRAM;
+/// A program that ends while operations of a client over TLS are under way.
+extern const char *const CLIENT_IN_FLIGHT_HOST_PROGRAM;
 
 /// Runs `program` to its end, with `environment` ("NAME=VALUE NAME=VALUE") and the folder of the test data in DATA.
 /// Returns its output, followed by "ended with N" when its exit code N, in the shell's form, is not 0.

@@ -4,8 +4,7 @@
 
 #ifdef SSOCLIENT_HAS_COROUTINES
 
-#include "coroutine_types.h"
-
+#include "support/coroutine_types.h"
 #include "support/rendezvous.h"
 #include "support/sanitized.h"
 #include "support/throws_message.h"

@@ -21,6 +21,7 @@ struct SystemFaults {
   int renameError = 0;
   int truncationError = 0;
   bool dropsModes = false;                    ///< `fchmod` fails with EPERM
+  bool skipsSynchronisation = false;          ///< `fsync` does nothing, and succeeds
   bool isOtherUser = false;                   ///< the process seems to have another effective user
   std::function<void()> beforeLock = nullptr; ///< called once, before the next lock is taken
   std::function<void()> beforeRename = nullptr;

@@ -27,13 +27,22 @@ void ManualIssuer::Renew(const std::shared_ptr<const SamlToken> &token, std::int
 
 void ManualIssuer::Add(Request request) const {
   const std::lock_guard<std::mutex> lock(m_mutex);
-  m_texts.push_back(request.text);
+  if (m_onRequest) {
+    m_onRequest(request.text);
+  } else {
+    m_texts.push_back(request.text);
+  }
   m_open.push_back(std::move(request));
 }
 
 std::vector<std::string> ManualIssuer::GetTexts() const {
   const std::lock_guard<std::mutex> lock(m_mutex);
   return m_texts;
+}
+
+void ManualIssuer::OnRequest(std::function<void(const std::string &text)> function) {
+  const std::lock_guard<std::mutex> lock(m_mutex);
+  m_onRequest = std::move(function);
 }
 
 std::size_t ManualIssuer::CountOpen() const {

@@ -34,6 +34,8 @@ public:
   /// The requests so far, as texts, in order.
   std::vector<std::string> GetTexts() const;
   std::size_t Count() const { return GetTexts().size(); }
+  /// Calls `function` with the text of each later request, in place of keeping it.
+  void OnRequest(std::function<void(const std::string &text)> function);
   /// The requests that have been neither answered nor cancelled.
   std::size_t CountOpen() const;
 
@@ -46,6 +48,7 @@ private:
   mutable std::mutex m_mutex; // guards all that follows
   mutable std::deque<Request> m_open;
   mutable std::vector<std::string> m_texts;
+  std::function<void(const std::string &text)> m_onRequest;
 };
 
 /// The outcomes of calls: "ID" of a token, or "CLASS: MESSAGE".

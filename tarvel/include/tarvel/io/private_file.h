@@ -45,9 +45,6 @@ public:
   void Clear();
 
 private:
-  void RequireOwnProcess() const;
-  void Release() noexcept;
-
   std::string m_path;
   int m_descriptor;
   unsigned m_generation; // of the process that has the lock
