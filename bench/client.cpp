@@ -41,10 +41,15 @@ using Kind = HeldServer::Kind;
 constexpr std::chrono::milliseconds SERVICE_TIME{100};
 constexpr unsigned long SPARE_DESCRIPTORS = 100;
 
+/// So many acquisitions at once, in so many rounds.
+struct CrowdSize {
+  std::size_t operations;
+  int rounds;
+};
+
 struct Settings {
   std::size_t underWay = 10'000;
-  std::vector<std::size_t> crowds{1'000, 10'000};
-  int rounds = 5;
+  std::vector<CrowdSize> crowds{{1'000, 9}, {10'000, 3}};
   std::size_t cancels = 200;
   std::size_t cancelsAmong = 1'000;
   int getRounds = 15;
@@ -143,8 +148,8 @@ Throughput MeasureThroughput(Kind kind, std::size_t operations, int rounds) {
 
 std::vector<Throughput> MeasureCrowds(Kind kind, const Settings &settings) {
   std::vector<Throughput> crowds;
-  for (const std::size_t operations : settings.crowds) {
-    crowds.push_back(MeasureThroughput(kind, operations, settings.rounds));
+  for (const auto &[operations, rounds] : settings.crowds) {
+    crowds.push_back(MeasureThroughput(kind, operations, rounds));
     std::printf("%6zu at once over %s: %.0f a second, libcurl %.0f, share %.2f\n", operations,
                 kind == Kind::HTTP ? "http" : "TLS", crowds.back().oursPerSecond, crowds.back().libcurlPerSecond,
                 crowds.back().share);
@@ -257,8 +262,7 @@ Settings ReadArguments(const std::vector<std::string> &arguments) {
   for (std::size_t i = 0; i < arguments.size(); ++i) {
     if (arguments[i] == "--quick") {
       settings.underWay = 1'000;
-      settings.crowds = {300};
-      settings.rounds = 3;
+      settings.crowds = {{300, 3}};
       settings.cancels = 30;
       settings.cancelsAmong = 200;
       settings.getRounds = 5;
