@@ -21,8 +21,16 @@ public:
   CurlClient(const std::string &url, const std::string &authorityFile, const std::string &soapAction,
              const std::string &body);
 
+  CurlClient(const CurlClient &) = delete;
+  CurlClient &operator=(const CurlClient &) = delete;
+
   /// The body of the response, valid until the next call. @throws std::runtime_error
   const std::string &Post();
+
+  /// The prepared request, for a crowd of them in one multi interface.
+  CURL *GetHandle() const noexcept { return m_handle.get(); }
+  const std::string &GetResponse() const noexcept { return m_response; }
+  void ClearResponse() noexcept { m_response.clear(); }
 
 private:
   template <typename T>

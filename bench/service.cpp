@@ -3,8 +3,9 @@
 /// Compares acquiring a token by password over loopback TLS with the work that cannot be avoided: the exchange of the
 /// same bytes, by libcurl, and one check of the token. The limit is the sum of the two; both in one loop are measured
 /// as well. Each exchange has a new connection, with a full handshake or a resumed one. The times are wall times, which
-/// a caller waits for; the server runs in this process, and all figures include its work. The last figures are the
-/// tokens that one service acquires in a second for several threads.
+/// a caller waits for; the server runs in this process, and all figures include its work. The same is measured through
+/// `TokenClient`, with its call that waits. The last figures are the tokens that one service acquires in a second for
+/// several threads.
 
 #include "canned_server.h"
 #include "curl_client.h"
@@ -13,6 +14,7 @@
 #include "exchange/request_builder_impl.h"
 #include "support/soap_responses.h"
 
+#include <ssoclient/client/token_client.h>
 #include <ssoclient/create_saml_token.h>
 #include <ssoclient/security_token_service.h>
 #include <tarvel/ssl/ssl_context.h>
@@ -58,17 +60,20 @@ const CannedServer &GetServer(bool resumes) {
   return resumes ? resumed : full;
 }
 
+SsoClient::SecurityTokenServiceConfig ConfigFor(const std::string &url, Tarvel::Ssl::SSLContext &context) {
+  context.TrustFile(CannedServer::AUTHORITY_FILE);
+  SsoClient::SecurityTokenServiceConfig config;
+  config.stsUrl = url;
+  config.signingCertificates = GetTrusted();
+  config.sslContext = &context;
+  return config;
+}
+
 /// A service as a host would create it, with its own TLS context.
 class Service {
 public:
-  explicit Service(const std::string &url) {
-    m_context->TrustFile(CannedServer::AUTHORITY_FILE);
-    SsoClient::SecurityTokenServiceConfig config;
-    config.stsUrl = url;
-    config.signingCertificates = GetTrusted();
-    config.sslContext = m_context.get();
-    m_service = SsoClient::CreateSecurityTokenService(config);
-  }
+  explicit Service(const std::string &url)
+      : m_service(SsoClient::CreateSecurityTokenService(ConfigFor(url, *m_context))) {}
 
   std::shared_ptr<const SsoClient::SamlToken> Acquire() const {
     return m_service->AcquireToken(USER, PASSWORD, m_spec);
@@ -77,7 +82,22 @@ public:
 private:
   const Tarvel::Ref<Tarvel::Ssl::SSLContext> m_context = Tarvel::Ssl::CreateSSLContext();
   const SsoClient::TokenSpec m_spec = Spec();
-  std::shared_ptr<const SsoClient::SecurityTokenService> m_service;
+  const std::shared_ptr<const SsoClient::SecurityTokenService> m_service;
+};
+
+/// The same through the client for deadlines and cancellation.
+class Client {
+public:
+  explicit Client(const std::string &url) : m_client(ConfigFor(url, *m_context)) {}
+
+  std::shared_ptr<const SsoClient::SamlToken> Acquire() const { return m_client.Acquire(m_credential, m_spec); }
+
+private:
+  const Tarvel::Ref<Tarvel::Ssl::SSLContext> m_context = Tarvel::Ssl::CreateSSLContext();
+  const SsoClient::TokenSpec m_spec = Spec();
+  const SsoClient::Credential m_credential =
+      SsoClient::PasswordCredential{USER, Tarvel::SecretText(std::string(PASSWORD))};
+  const SsoClient::TokenClient m_client;
 };
 
 /// Posts the same request as the service.
@@ -113,8 +133,9 @@ private:
   const int m_before;
 };
 
+template <typename ServiceOrClient>
 void Acquire(benchmark::State &state, bool resumes) {
-  const Service service(GetServer(resumes).GetUrl());
+  const ServiceOrClient service(GetServer(resumes).GetUrl());
   service.Acquire(); // afterwards there is a session to resume
   const HandshakeCheck check(state, GetServer(resumes));
   for (auto _ : state) {
@@ -164,9 +185,11 @@ void RegisterBenchmarks() {
   const auto add = [](const char *name, auto function, auto... arguments) {
     return benchmark::RegisterBenchmark(name, function, arguments...)->Unit(benchmark::kMicrosecond)->UseRealTime();
   };
-  add("AcquireToken/full", Acquire, false);
+  add("AcquireToken/full", Acquire<Service>, false);
+  add("TokenClient/full", Acquire<Client>, false);
   add("libcurl/full", Exchange, false);
-  add("AcquireToken/resumed", Acquire, true);
+  add("AcquireToken/resumed", Acquire<Service>, true);
+  add("TokenClient/resumed", Acquire<Client>, true);
   add("libcurl/resumed", Exchange, true);
   add("CreateSamlToken", Verify);
   add("both/full", ExchangeAndVerify, false);
@@ -183,9 +206,12 @@ void WriteComparison(const Medians &medians, const std::string &handshake, std::
   const double verification = medians.at("CreateSamlToken/real_time").wallUs;
   const double limit = libcurl + verification;
   const double inOneLoop = medians.at("both/" + handshake + "/real_time").wallUs;
+  const double client = medians.at("TokenClient/" + handshake + "/real_time").wallUs;
   out << "\"ours_us\": " << ours << ", \"limit_us\": " << limit << ", \"ratio\": " << ours / limit
       << ", \"limit_parts\": {\"libcurl\": " << libcurl << ", \"verification\": " << verification
-      << "},\n    \"limit_in_one_loop_us\": " << inOneLoop << ", \"ratio_in_one_loop\": " << ours / inOneLoop;
+      << "},\n    \"limit_in_one_loop_us\": " << inOneLoop << ", \"ratio_in_one_loop\": " << ours / inOneLoop
+      << ",\n    \"token_client\": {\"ours_us\": " << client << ", \"ratio\": " << client / ours
+      << ", \"ratio_in_one_loop\": " << client / inOneLoop << "}";
 }
 
 // Times are microseconds of wall time.

@@ -7,8 +7,8 @@
 #include <ssoclient/client/token_source.h>
 #include <tarvel/core/fork_safe_mutex.h>
 
-#include <list>
 #include <functional>
+#include <list>
 #include <memory>
 #include <utility>
 #include <vector>

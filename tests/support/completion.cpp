@@ -51,17 +51,19 @@ bool DrainIoThreads() {
   struct Meeting {
     std::mutex mutex;
     std::condition_variable changed;
-    int present = 0;
+    std::size_t present = 0;
   };
   const auto meeting = std::make_shared<Meeting>();
   const auto attend = [meeting] {
     std::unique_lock<std::mutex> lock(meeting->mutex);
     ++meeting->present;
     meeting->changed.notify_all();
-    return meeting->changed.wait_for(lock, PATIENCE, [&meeting] { return meeting->present == 3; });
+    return meeting->changed.wait_for(lock, PATIENCE,
+                                     [&meeting] { return meeting->present == Tarvel::System::IO_THREADS + 1; });
   };
-  boost::asio::post(Tarvel::System::GetIoContext(), attend);
-  boost::asio::post(Tarvel::System::GetIoContext(), attend);
+  for (std::size_t thread = 0; thread < Tarvel::System::IO_THREADS; ++thread) {
+    boost::asio::post(Tarvel::System::GetIoContextOf(thread), attend);
+  }
   return attend();
 }
 

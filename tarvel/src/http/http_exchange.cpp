@@ -59,7 +59,7 @@ HttpExchange::HttpExchange(const Ref<ConnectionSpec> &spec, const Ref<CookieStor
 }
 
 HttpExchange::~HttpExchange() {
-  SecureWipe(m_buffer.data(), m_buffer.size());
+  SecureWipe(m_buffer.get(), m_bufferLength);
 }
 
 void HttpExchange::Start() {
@@ -109,7 +109,6 @@ void HttpExchange::OnConnected(const Ref<System::Stream> &stream, const Exceptio
     }
     m_connecting.reset();
     m_stream = stream;
-    m_hasConnected = stream && !failure;
     isCancelled = m_isCancelled;
   }
   if (isCancelled) {
@@ -123,6 +122,7 @@ void HttpExchange::OnConnected(const Ref<System::Stream> &stream, const Exceptio
     if (!stream) {
       throw InvalidStateException("A connection specification reported neither a stream nor a failure");
     }
+    ReplaceBuffer(FIRST_BUFFER_BYTES);
     Send(stream);
     // Reads at once, because a server that refuses a request may answer and close before it has read the request.
     Read(stream);
@@ -135,6 +135,10 @@ void HttpExchange::Send(const Ref<System::Stream> &stream) {
                         m_cookies->GetHeader(m_spec->GetHost(), m_request.target, m_isSecure));
   m_request.body = SecretText();
   const std::string &message = m_message.Get();
+  {
+    const std::lock_guard<ForkSafeMutex> lock(m_mutex);
+    m_hasConnected = true; // even if the write fails: it may have sent a part
+  }
   stream->AsyncWrite(message.data(), message.size(), [self = Ref(this)](std::size_t, const Exception *failure) {
     self->RunGuarded([&self, failure] { self->OnWritten(failure); });
   });
@@ -156,8 +160,15 @@ void HttpExchange::OnWritten(const Exception *failure) {
   }
 }
 
+void HttpExchange::ReplaceBuffer(std::size_t length) {
+  auto buffer = std::make_unique_for_overwrite<char[]>(length);
+  SecureWipe(m_buffer.get(), m_bufferLength);
+  m_buffer = std::move(buffer);
+  m_bufferLength = length;
+}
+
 void HttpExchange::Read(const Ref<System::Stream> &stream) {
-  stream->AsyncReadSome(m_buffer.data(), m_buffer.size(),
+  stream->AsyncReadSome(m_buffer.get(), m_bufferLength,
                         [self = Ref(this)](std::size_t count, const Exception *failure) {
                           self->RunGuarded([&self, count, failure] { self->OnRead(count, failure); });
                         });
@@ -171,10 +182,13 @@ void HttpExchange::OnRead(std::size_t count, const Exception *failure) {
     OnEnd();
     return;
   }
-  ParseWithContext([this, count] { m_reader.Put({m_buffer.data(), count}); });
+  ParseWithContext([this, count] { m_reader.Put({m_buffer.get(), count}); });
   if (m_reader.IsComplete()) {
     FinishResponse();
     return;
+  }
+  if (m_bufferLength < BUFFER_BYTES) {
+    ReplaceBuffer(BUFFER_BYTES);
   }
   Ref<System::Stream> stream;
   {

@@ -13,7 +13,6 @@
 #include <tarvel/http/cookie_store.h>
 #include <tarvel/http/user_agent.h>
 
-#include <array>
 #include <chrono>
 #include <condition_variable>
 #include <cstddef>
@@ -46,6 +45,8 @@ public:
   void TimeOut(std::int64_t timeoutMicroseconds) noexcept override;
 
 private:
+  /// Many requests may wait for their responses, so the first buffer is small; most responses fit in it.
+  static constexpr std::size_t FIRST_BUFFER_BYTES = 8 * 1024;
   static constexpr std::size_t BUFFER_BYTES = 16 * 1024; // the content of one TLS record
 
   ~HttpExchange() override;
@@ -56,6 +57,7 @@ private:
   void OnEnd();
 
   void Send(const Ref<System::Stream> &stream);
+  void ReplaceBuffer(std::size_t length);
   void Read(const Ref<System::Stream> &stream);
   void FinishEnd();
   void FinishResponse();
@@ -85,7 +87,9 @@ private:
   // Only one step at a time uses each of these members, so they need no lock. The message is kept until it is written.
   RequestData m_request;
   SecretText m_message;
-  std::array<char, BUFFER_BYTES> m_buffer; // as secret as the response
+  // As secret as the response.
+  std::unique_ptr<char[]> m_buffer; // NOLINT(modernize-avoid-c-arrays): with its length beside it
+  std::size_t m_bufferLength = 0;
   ResponseReader m_reader;
   bool m_isSecure = false;
 

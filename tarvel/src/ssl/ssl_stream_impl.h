@@ -13,6 +13,7 @@
 #include <tarvel/ssl/ssl_context.h>
 
 #include <atomic>
+#include <cstddef>
 #include <memory>
 #include <optional>
 #include <string>
@@ -33,6 +34,11 @@ public:
   void Close() noexcept override;
 
 private:
+  /// Many connections may wait for their servers, so they wait with a small buffer. If the server sends more, the next
+  /// read uses the large one, which holds the largest TLS record with its header (RFC 8446, section 5.2).
+  static constexpr std::size_t WAITING_INPUT_BYTES = 4096;
+  static constexpr std::size_t INPUT_BYTES = 5 + TlsConnection::RECORD_BYTES + 256;
+
   using Failure = Completions::Failure;
   using Progress = TlsConnection::Progress;
 
@@ -124,6 +130,7 @@ private:
   bool m_lowerEnded = false;
   LowerFailure m_lowerWriteFailure; // after which nothing can be written
   std::vector<char> m_lowerInput;
+  std::size_t m_inputBytes = WAITING_INPUT_BYTES; // for the next read of the stream below
   std::vector<char> m_lowerOutput;
 
   Crypto::OpenSslCleanUpNotice m_endNotice{OnOpenSslEnd, this}; // last: all other members must exist when it calls

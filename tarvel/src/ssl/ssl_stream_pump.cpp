@@ -20,8 +20,6 @@ namespace Tarvel::Ssl {
 
 namespace {
 
-/// The largest TLS record, with its header (RFC 8446, section 5.2).
-constexpr std::size_t INPUT_BYTES = 5 + TlsConnection::RECORD_BYTES + 256;
 /// Nothing is encrypted while this many bytes wait for the stream below, so that a large message is not in memory a
 /// second time.
 constexpr std::size_t MAX_OUTPUT_BYTES = 4 * TlsConnection::RECORD_BYTES;
@@ -116,6 +114,7 @@ void SSLStreamImpl::Pump(Completions &done) {
   }
   StartLowerWrite();
   if (waits) {
+    m_tls.ReleaseEmptyBuffers();
     StartLowerRead();
   }
 }
@@ -140,7 +139,6 @@ bool SSLStreamImpl::StepHandshake(Completions &done) {
 
 void SSLStreamImpl::BeginHandshake(Completions &done) {
   try {
-    m_lowerInput.resize(INPUT_BYTES);
     m_tls.Begin(m_host, m_parameter);
   } catch (const OutOfMemoryException &) {
     FailWith(m_noMemory, done);
@@ -198,6 +196,9 @@ void SSLStreamImpl::StartLowerRead() {
   if (m_lowerReads || m_stage == Stage::FAILED) {
     return;
   }
+  if (m_lowerInput.size() != m_inputBytes) {
+    m_lowerInput = std::vector<char>(m_inputBytes);
+  }
   m_lower->AsyncReadSome(m_lowerInput.data(), m_lowerInput.size(),
                          [self = Ref(this)](std::size_t count, const Exception *exception) {
                            self->AdvanceOnIoThread([self, count, failure = DescribeLowerFailure(exception)](
@@ -217,6 +218,7 @@ void SSLStreamImpl::OnLowerRead(std::size_t count, const LowerFailure &failure, 
     return;
   }
   m_lowerEnded = count == 0;
+  m_inputBytes = count < WAITING_INPUT_BYTES ? WAITING_INPUT_BYTES : INPUT_BYTES;
   if (count > 0) {
     m_tls.PutInput(m_lowerInput.data(), count);
   }
@@ -248,6 +250,7 @@ void SSLStreamImpl::StartLowerWrite() {
 // reason.
 void SSLStreamImpl::OnLowerWritten(const LowerFailure &failure, Completions &done) {
   m_lowerWrites = false;
+  std::vector<char>().swap(m_lowerOutput); // not needed while the server computes its answer
   if (m_stage == Stage::FAILED) {
     FailPending(m_failure, done);
     return;

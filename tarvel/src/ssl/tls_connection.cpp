@@ -7,6 +7,7 @@
 #include <tarvel/core/exception.h>
 #include <tarvel/core/string_util.h>
 
+#include <openssl/buffer.h>
 #include <openssl/err.h>
 
 #include <algorithm>
@@ -37,6 +38,19 @@ std::string DescribeRefusal(X509_STORE_CTX *verification) {
   return std::string("the server's certificate was not accepted: ") +
          X509_verify_cert_error_string(X509_STORE_CTX_get_error(verification)) + " (certificate \"" +
          DescribeSubject(X509_STORE_CTX_get_current_cert(verification)) + "\")";
+}
+
+/// Gives `buffer` new memory, as little as possible, if it is empty and has had bytes before.
+void ReleaseIfEmpty(BIO *buffer) noexcept {
+  BUF_MEM *memory = nullptr;
+  BIO_get_mem_ptr(buffer, &memory);
+  if (BIO_ctrl_pending(buffer) > 0 || memory->max == 0) {
+    return;
+  }
+  if (BUF_MEM *const empty = BUF_MEM_new()) {
+    BIO_set_mem_buf(buffer, empty, BIO_CLOSE);
+    BIO_set_mem_eof_return(buffer, -1);
+  }
 }
 
 /// The connection whose server is being verified.
@@ -298,6 +312,12 @@ void TlsConnection::TakeOutput(std::vector<char> &output, std::size_t maximum) {
 
 void TlsConnection::DropOutput() noexcept {
   BIO_reset(m_toSend);
+}
+
+void TlsConnection::ReleaseEmptyBuffers() noexcept {
+  SSL_free_buffers(m_connection.get()); // SSL_MODE_RELEASE_BUFFERS would release only the one for received records
+  ReleaseIfEmpty(m_received);
+  ReleaseIfEmpty(m_toSend);
 }
 
 void TlsConnection::KeepResumable() noexcept {

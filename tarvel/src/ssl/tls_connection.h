@@ -83,6 +83,10 @@ public:
 
   void DropOutput() noexcept;
 
+  /// Frees the buffers that are empty: of this connection, and of OpenSSL for its records. Called before a wait for the
+  /// server, which may be long.
+  void ReleaseEmptyBuffers() noexcept;
+
   /// Keeps the session of an established connection resumable when the connection ends now. Otherwise OpenSSL would
   /// treat the session as broken. OpenSSL itself records the errors that do make the session invalid.
   void KeepResumable() noexcept;

@@ -13,7 +13,10 @@
 #include <boost/asio/steady_timer.hpp>
 #include <boost/system/system_error.hpp>
 
+#include <algorithm>
+#include <array>
 #include <atomic>
+#include <cstddef>
 #include <memory>
 #include <mutex>
 #include <string>
@@ -21,9 +24,6 @@
 namespace Tarvel::System {
 
 namespace {
-
-/// Two, so that one long handshake does not delay everything else.
-constexpr int IO_THREADS = 2;
 
 struct Descriptors {
   ForkSafeMutex mutex;
@@ -36,41 +36,81 @@ Descriptors &GetDescriptors() {
   return *descriptors;
 }
 
-class IoEngine final : public ForkListener {
-public:
+/// The context of one I/O thread. If two threads shared a context, Asio would wake the other one at each event, to wait
+/// for the next event while the first handles this one. For a single request that takes longer than the work.
+struct ThreadContext {
   /// @throws boost::system::system_error when no descriptor is left.
-  IoEngine() {
+  ThreadContext() {
     // When the first socket and the first timer are made, Asio opens the descriptors that it waits on. Both are made
     // here, so that no later one fails for lack of descriptors.
-    const boost::asio::ip::tcp::socket socket(m_context);
-    const boost::asio::steady_timer timer(m_context);
+    const boost::asio::ip::tcp::socket socket(context);
+    const boost::asio::steady_timer timer(context);
   }
 
+  boost::asio::io_context context{1}; // one thread
+  const boost::asio::executor_work_guard<boost::asio::io_context::executor_type> work{context.get_executor()};
+  std::atomic<int> sockets{0};
+};
+
+class IoEngine;
+
+/// What the calling thread runs, if it is an I/O thread.
+struct Running {
+  IoEngine *engine = nullptr;
+  ThreadContext *context = nullptr;
+};
+thread_local Running running;
+
+class IoEngine final : public ForkListener {
+public:
   /// @throws InvalidStateException when no thread can be started.
   void Start() {
-    StartBackgroundThread("tarvel-io", [this] { Run(); }).detach();
+    StartThread();
     try {
-      for (int started = 1; started < IO_THREADS; ++started) {
-        StartBackgroundThread("tarvel-io", [this] { Run(); }).detach();
+      while (m_started < IO_THREADS) {
+        StartThread();
       }
     } catch (...) {
-      // The first thread runs already. It does the same work, only more slowly.
+      // The first thread runs already. It does all the work, only more slowly.
     }
   }
 
-  boost::asio::io_context &GetContext() noexcept { return m_context; }
+  /// The calling thread's own context; on other threads, the one with the fewest sockets.
+  ThreadContext &GetContext() noexcept {
+    if (running.engine == this) {
+      return *running.context;
+    }
+    return *std::min_element(
+        m_contexts.begin(), m_contexts.begin() + m_started, [](const ThreadContext &left, const ThreadContext &right) {
+          return left.sockets.load(std::memory_order_relaxed) < right.sockets.load(std::memory_order_relaxed);
+        });
+  }
 
-  // The threads leave the context when their handlers have returned, and then hold no lock of Asio.
-  void BeforeFork() noexcept override { m_context.stop(); }
+  boost::asio::io_context &GetContextOf(std::size_t thread) noexcept { return m_contexts[thread].context; }
+
+  // The threads leave their contexts when their handlers have returned, and then hold no lock of Asio.
+  void BeforeFork() noexcept override {
+    for (ThreadContext &own : m_contexts) {
+      own.context.stop();
+    }
+  }
   void AtFork() noexcept override { Notify(boost::asio::execution_context::fork_prepare); }
   void AfterForkInParent() noexcept override {
     Notify(boost::asio::execution_context::fork_parent);
-    m_context.restart();
+    for (ThreadContext &own : m_contexts) {
+      own.context.restart();
+    }
   }
   void AfterForkInChild() noexcept override;
 
 private:
-  void Run() noexcept {
+  void StartThread() {
+    StartBackgroundThread("tarvel-io", [this, own = &m_contexts[m_started]] { Run(*own); }).detach();
+    ++m_started;
+  }
+
+  void Run(ThreadContext &own) noexcept {
+    running = {this, &own};
     const unsigned generation = GetForkGeneration();
     for (;;) {
       const Computation computing; // waits during a fork
@@ -78,7 +118,7 @@ private:
         return; // a handler forked, and this is the thread's copy in the child
       }
       try {
-        m_context.run();
+        own.context.run();
       } catch (...) {
         Service::LogUncaughtException("a completion handler");
       }
@@ -86,15 +126,17 @@ private:
   }
 
   void Notify(boost::asio::execution_context::fork_event event) noexcept {
-    try {
-      m_context.notify_fork(event);
-    } catch (const boost::system::system_error &) {
-      // No descriptor is left for the child's copy of the context, which the child does not use.
+    for (ThreadContext &own : m_contexts) {
+      try {
+        own.context.notify_fork(event);
+      } catch (const boost::system::system_error &) {
+        // No descriptor is left for the child's copy of the context, which the child does not use.
+      }
     }
   }
 
-  boost::asio::io_context m_context{IO_THREADS};
-  const boost::asio::executor_work_guard<boost::asio::io_context::executor_type> m_work{m_context.get_executor()};
+  std::array<ThreadContext, IO_THREADS> m_contexts;
+  std::size_t m_started = 0; // so many contexts, the first ones, have a thread
   IoEngine *m_ofParent =
       nullptr; // never used; keeps the objects of the parent's operations reachable, so that no leak is reported
 };
@@ -140,11 +182,30 @@ IoEngine &StartEngine() {
   }
 }
 
+IoEngine &GetEngine() {
+  IoEngine *const started = engine.load(std::memory_order_acquire);
+  return started ? *started : StartEngine();
+}
+
 } // namespace
 
 boost::asio::io_context &GetIoContext() {
-  IoEngine *const started = engine.load(std::memory_order_acquire);
-  return (started ? *started : StartEngine()).GetContext();
+  return GetEngine().GetContext().context;
+}
+
+boost::asio::io_context &GetIoContextOf(std::size_t thread) {
+  return GetEngine().GetContextOf(thread);
+}
+
+SocketContext::SocketContext() {
+  ThreadContext &chosen = GetEngine().GetContext();
+  m_context = &chosen.context;
+  m_sockets = &chosen.sockets;
+  m_sockets->fetch_add(1, std::memory_order_relaxed);
+}
+
+SocketContext::~SocketContext() {
+  m_sockets->fetch_sub(1, std::memory_order_relaxed);
 }
 
 void ClosesInChild::Enter() {

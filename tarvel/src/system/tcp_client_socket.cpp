@@ -63,7 +63,7 @@ struct TcpClientSocketImpl::PendingWrite {
 };
 
 TcpClientSocketImpl::TcpClientSocketImpl()
-    : m_socket(GetIoContext()), m_connectEnd(GetIoContext()), m_attemptTimer(GetIoContext()) {
+    : m_socket(m_context.Get()), m_connectEnd(m_context.Get()), m_attemptTimer(m_context.Get()) {
   OutOfMemory(); // made while there is memory
   Enter();
 }
@@ -294,7 +294,7 @@ void TcpClientSocketImpl::AsyncReadSome(char *buffer, std::size_t length, Transf
     return;
   }
   if (m_readEnd) {
-    asio::post(GetIoContext(), [self = Ref(this), handler = std::move(handler), error = m_readEnd] {
+    asio::post(m_context.Get(), [self = Ref(this), handler = std::move(handler), error = m_readEnd] {
       self->CompleteRead(handler, error, 0);
     });
     return;

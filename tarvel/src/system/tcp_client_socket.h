@@ -69,6 +69,7 @@ private:
 
   NetworkException DescribeTransferFailure(const boost::system::error_code &error) const noexcept;
 
+  const SocketContext m_context;
   mutable ForkSafeMutex m_mutex; // guards all that follows; never held while a handler runs
   boost::asio::ip::tcp::socket m_socket;
   Stage m_stage = Stage::FRESH;

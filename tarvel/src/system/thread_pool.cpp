@@ -213,12 +213,14 @@ public:
   Ref<ScheduledItem> QueueWorkItem(std::function<void()> work) override {
     const std::shared_ptr<PoolState> state = GetState();
     const Ref<WorkItem> item = MakeRef<WorkItem>(state, std::move(work));
-    const std::lock_guard<ForkSafeMutex> lock(state->mutex);
-    item->Enqueue();
-    if (state->queue.size() > state->idle && state->threads.size() < state->ceiling) {
-      StartThreadFor(*item, state);
+    {
+      const std::lock_guard<ForkSafeMutex> lock(state->mutex);
+      item->Enqueue();
+      if (state->queue.size() > state->idle && state->threads.size() < state->ceiling) {
+        StartThreadFor(*item, state);
+      }
     }
-    state->changed.notify_one();
+    state->changed.notify_one(); // after the lock is released: otherwise the woken thread would wait for it at once
     return item;
   }
 

@@ -150,8 +150,7 @@ void TimerQueue::Arm(TimePoint time) {
   m_isArmed = true;
 }
 
-/// Sets the next alarm before it runs what is due. So another I/O thread can run the rest meanwhile, and Asio uses the
-/// memory of this alarm for the next one.
+/// Sets the next alarm before it runs what is due, so that Asio uses the memory of this alarm for the next one.
 void TimerQueue::OnAlarm(bool isReplaced) {
   Batch batch;
   {

@@ -1,8 +1,8 @@
 // SPDX-License-Identifier: Apache-2.0
 // The options of one call replace those of the client, and only for that call.
-#include "support/operation_forms.h"
 #include "integration/service/service_client.h"
 #include "support/data_file.h"
+#include "support/operation_forms.h"
 #include "support/posting_server.h"
 #include "support/recorded_events.h"
 #include "support/soap_responses.h"

@@ -1,7 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 // Operations over TLS that are cancelled at random moments, by the end of a thread, and by the end of their client.
-#include "support/operation_forms.h"
 #include "integration/service/service_client.h"
+#include "support/operation_forms.h"
 #include "support/process_resources.h"
 #include "support/rendezvous.h"
 #include "support/sanitized.h"

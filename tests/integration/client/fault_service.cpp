@@ -7,6 +7,7 @@
 #include "support/soap_responses.h"
 
 #include <ssoclient/client/exceptions.h>
+#include <tarvel/core/exception.h>
 
 #include <optional>
 #include <typeinfo>
@@ -26,6 +27,7 @@ std::string NameOfClass(const std::type_info &type) {
          : type == typeid(InvalidCredentialsException) ? "InvalidCredentialsException"
          : type == typeid(InvalidSignatureException)   ? "InvalidSignatureException"
          : type == typeid(SsoException)                ? "SsoException"
+         : type == typeid(Tarvel::IOException)         ? "IOException"
                                                        : type.name();
 }
 

@@ -1,7 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 // Each kind of credential in each form against the development service, over TLS: all facts of the token are compared.
-#include "support/operation_forms.h"
 #include "integration/service/service_client.h"
+#include "support/operation_forms.h"
 #include "support/rendezvous.h"
 #include "support/throws_message.h"
 

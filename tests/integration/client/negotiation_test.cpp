@@ -1,7 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 // Negotiations of many legs, with a scripted service.
-#include "support/operation_forms.h"
 #include "support/data_file.h"
+#include "support/operation_forms.h"
 #include "support/posting_server.h"
 #include "support/process_resources.h"
 #include "support/rendezvous.h"

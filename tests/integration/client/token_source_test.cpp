@@ -1,7 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 // A token source over a client, against the development service over TLS.
-#include "support/operation_forms.h"
 #include "integration/service/service_client.h"
+#include "support/operation_forms.h"
 #include "support/process_resources.h"
 #include "support/rendezvous.h"
 #include "support/throws_message.h"

@@ -31,7 +31,6 @@ using SsoClient::TokenClient;
 using SsoClient::TokenOutcome;
 using SsoClient::TokenSource;
 
-
 constexpr int MAX_PIECES = 100000;
 const std::string BODY = IssueResponse(ReadDataFile("tokens/bearer.xml"));
 

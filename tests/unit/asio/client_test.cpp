@@ -10,6 +10,7 @@
 #include "support/soap_responses.h"
 
 #include <ssoclient/asio/async_client.h>
+#include <ssoclient/asio/async_source.h>
 #include <ssoclient/client/exceptions.h>
 #include <ssoclient/create_saml_token.h>
 #include <tarvel/core/exception.h>
@@ -34,6 +35,7 @@ namespace {
 using boost::asio::io_context;
 using boost::asio::use_future;
 using SsoClient::Asio::AsyncAcquire;
+using SsoClient::Asio::AsyncGet;
 using SsoClient::Asio::AsyncRenew;
 using SsoClient::Asio::AsyncValidate;
 using TokenPtr = std::shared_ptr<const SsoClient::SamlToken>;
@@ -51,7 +53,7 @@ public:
                              std::to_string(answer.size()) + "\r\n\r\n" + answer);
           }
         }),
-        client(std::make_unique<SsoClient::TokenClient>(MakeConfig())) {}
+        client(std::make_shared<SsoClient::TokenClient>(MakeConfig())) {}
 
   std::size_t GetOpenCount() { return m_server.GetOpenCount(); }
 
@@ -67,7 +69,7 @@ private:
   ScriptedServer m_server;
 
 public:
-  const std::unique_ptr<SsoClient::TokenClient> client;
+  const std::shared_ptr<SsoClient::TokenClient> client;
 };
 
 const SsoClient::PasswordCredential ALICE{"alice", Tarvel::SecretText("secret")};
@@ -138,6 +140,37 @@ TEST(AsyncValidate, AsksTheService) {
   EXPECT_TRUE(AsyncValidate(*valid.client, HolderToken(), {}, use_future).get());
   const World invalid(ValidateResponse("http://docs.oasis-open.org/ws-sx/ws-trust/200512/status/invalid"));
   EXPECT_FALSE(AsyncValidate(*invalid.client, HolderToken(), {}, use_future).get());
+}
+
+SsoClient::Credential ProvideAlice() {
+  return ALICE;
+}
+
+TEST(AsyncGet, GivesTheTokenOfASource) {
+  const World world(IssueResponse(BearerXml()));
+  const SsoClient::TokenSource source(world.client, ProvideAlice, SpecFor(60));
+  io_context context;
+  TokenPtr token;
+  AsyncGet(source, {}, boost::asio::bind_executor(context, [&token](const std::exception_ptr &, TokenPtr result) {
+             token = std::move(result);
+           }));
+  context.run();
+  ASSERT_NE(token, nullptr);
+  EXPECT_EQ(AsyncGet(source, {}, use_future).get(), token);
+}
+
+TEST(AsyncGet, PassesTheDeadlineAndTheCancelToken) {
+  const World world("");
+  const SsoClient::TokenSource source(world.client, ProvideAlice, SpecFor(60));
+  SsoClient::GetOptions late;
+  late.deadline = std::chrono::steady_clock::now();
+  EXPECT_THROW(AsyncGet(source, late, use_future).get(), SsoClient::DeadlineExceededException);
+  const SsoClient::CancelSource cancelSource;
+  SsoClient::GetOptions cancelled;
+  cancelled.cancelToken = cancelSource.GetToken();
+  std::future<TokenPtr> future = AsyncGet(source, cancelled, use_future);
+  cancelSource.Cancel();
+  EXPECT_THROW(future.get(), SsoClient::CancelledException);
 }
 
 } // namespace

@@ -69,8 +69,9 @@ protected:
 /// A request that has been started.
 class TARVEL_API PendingRequestItem : public System::ScheduledItem {
 public:
-  /// Whether a connection was made, so that the server may have received a part of the request. Final once the completion function
-  /// has been called.
+  /// Whether the server may have received a part of the request: false means that none was sent, because no connection
+  /// was made (over TLS: because the handshake failed) or the request was cancelled before. Final once the completion
+  /// function is called. In a child process, what it was when the process forked.
   virtual bool HasConnected() const noexcept = 0;
 
   /// Cancels the request. Its completion function gets the exception that `WaitForRequest` throws after a time-out of

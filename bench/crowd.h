@@ -1,0 +1,62 @@
+// SPDX-License-Identifier: Apache-2.0
+/// @file
+/// `Crowd`, many acquisitions at once through one `TokenClient`, and the service that answers them.
+
+#pragma once
+
+#include "support/held_server.h"
+
+#include <ssoclient/client/cancellation.h>
+#include <ssoclient/client/token_client.h>
+#include <tarvel/core/ref.h>
+#include <tarvel/ssl/ssl_context.h>
+
+#include <chrono>
+#include <condition_variable>
+#include <cstddef>
+#include <memory>
+#include <mutex>
+#include <string>
+
+namespace Bench {
+
+/// The service's answer, the token in it, and who may sign it.
+const std::string &GetIssueResponse();
+const std::string &GetIssuedTokenXml();
+const Tarvel::Crypto::CertificateList &GetTrustedCertificates();
+extern const std::string CROWD_USER;
+extern const std::string CROWD_PASSWORD;
+SsoClient::TokenSpec GetCrowdSpec();
+
+/// A client of a server. The TLS context is the client's own.
+std::shared_ptr<const SsoClient::TokenClient> ConnectTo(const Testing::HeldServer &server);
+
+/// Starts acquisitions and counts their outcomes. Keeps little memory for each, so that what the process grows by is
+/// the library's.
+class Crowd {
+public:
+  explicit Crowd(std::shared_ptr<const SsoClient::TokenClient> client) : m_client(std::move(client)) {}
+  Crowd(const Crowd &) = delete;
+  Crowd &operator=(const Crowd &) = delete;
+
+  void Start(std::size_t count, const SsoClient::CallOptions &options = {});
+
+  /// Waits until all that were started have ended, each with the right token.
+  /// @throws std::runtime_error with the first other outcome, or after two minutes
+  void WaitForTokens();
+
+private:
+  void Note(const SsoClient::TokenOutcome &outcome);
+
+  const std::shared_ptr<const SsoClient::TokenClient> m_client;
+  std::mutex m_mutex;
+  std::condition_variable m_changed;
+  std::size_t m_pending = 0; // guarded by the mutex
+  std::string m_wrong;       // guarded by the mutex
+};
+
+/// Waits, looking each millisecond, until the server has received `count` requests in total.
+/// @throws std::runtime_error after two minutes
+void WaitForRequests(const Testing::HeldServer &server, int count);
+
+} // namespace Bench
