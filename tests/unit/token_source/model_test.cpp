@@ -35,6 +35,9 @@ std::string Shorten(const std::string &outcome) {
 class ModelRun {
 public:
   explicit ModelRun(unsigned seed) : m_generator(seed) { StartSource(); }
+  ModelRun(const ModelRun &) = delete;
+  ModelRun &operator=(const ModelRun &) = delete;
+  ~ModelRun() { m_provided->clear(); }
 
   /// One random event, for the source and for the model.
   /// @return what differs; empty if nothing does
@@ -82,6 +85,9 @@ private:
     if (!m_stage) {
       m_stage = std::make_unique<SourceStage>();
       m_model.wall = ReadClocks(m_stage->time).system;
+    }
+    if (m_provided) {
+      m_provided->clear(); // its functions share it
     }
     m_provided = std::make_shared<std::deque<std::function<void()>>>();
     m_stage->blocking = [provided = m_provided](std::function<void()> function) {
@@ -223,7 +229,6 @@ private:
 
   std::mt19937 m_generator;
   SourceModel m_model;
-  std::unique_ptr<SourceStage> m_stage;
   std::shared_ptr<std::deque<std::function<void()>>> m_provided;
   bool m_isProviderWell = true;
   std::vector<std::string> m_events;
@@ -231,6 +236,7 @@ private:
   std::map<std::string, int> m_kinds;
   int m_calls = 0;
   int m_tokens = 0;
+  std::unique_ptr<SourceStage> m_stage; // last, because calls end when it is destroyed
 };
 
 } // namespace
