@@ -124,7 +124,7 @@ private:
     if (event < 96) {
       return Invalidate();
     }
-    return event < 99 ? SetClock() : Draw(30) == 0 ? Destroy() : "nothing";
+    return event < 99 ? SetClock() : Draw(5) == 0 ? Destroy() : "nothing";
   }
 
   std::string Ask() {
@@ -173,7 +173,7 @@ private:
       const std::int64_t start = m_model.wall + Draw(3) * Draw(20 * SECOND) - Draw(10 * SECOND);
       token = {"t" + std::to_string(++m_tokens), start, start + Draw(Draw(4) == 0 ? 20 * SECOND : 1000 * SECOND),
                Draw(2) == 0};
-      token.id = Draw(50) == 0 ? "invalid" : token.id;
+      token.id = Draw(10) == 0 ? "invalid" : token.id;
     }
     m_stage->issuer->Answer(std::shared_ptr<const SamlToken>(std::make_shared<DatedToken>(
         token.id, token.start, token.end, token.isRenewable ? DatedToken::Kind::RENEWABLE : DatedToken::Kind::BEARER)));
