@@ -272,6 +272,7 @@ TEST(CredentialProvider, ThatReturnsAfterTheSourceWasDestroyedCausesNoRequest) {
   stage.blocking = [&](std::function<void()> function) { blocked.push_back(std::move(function)); };
   EXPECT_EQ(stage.Ask(), "waits");
   stage.Close();
+  EXPECT_EQ(stage.issuer.use_count(), 1) << "a provider that blocks does not keep the attempt";
   blocked.front()();
   EXPECT_EQ(stage.issuer->Count(), 0U);
 }

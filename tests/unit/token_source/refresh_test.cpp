@@ -202,6 +202,17 @@ TEST(TokenSourceClock, SetForwardEndsTheTokenAtOnce) {
   EXPECT_EQ(stage.Ask(), "waits");
 }
 
+TEST(TokenSourceClock, SetForwardDoesNotEndABackOff) {
+  SourceStage stage;
+  stage.Provide(stage.Token("first", 1000s));
+  stage.time.Advance(800s);
+  EXPECT_EQ(stage.Ask(), "first");
+  stage.issuer->Answer(Failure("down"));
+  stage.time.SetWallClock(10s);
+  EXPECT_EQ(stage.Ask(), "first");
+  EXPECT_EQ(stage.issuer->Count(), 2U);
+}
+
 TEST(TokenSourceClock, SetForwardAndBackLeavesTheToken) {
   SourceStage stage;
   stage.Provide(stage.Token("first", 1000s));
