@@ -38,6 +38,7 @@ std::uint64_t PublishedToken::ToWord(const Node *node) noexcept {
 }
 
 PublishedToken::Node *PublishedToken::ToNode(std::uint64_t word) noexcept {
+  // NOLINTNEXTLINE(performance-no-int-to-ptr): a pointer cannot share an atomic word with a count otherwise
   return reinterpret_cast<Node *>(static_cast<std::uintptr_t>((word & ADDRESS_MASK) << ALIGNMENT_BITS));
 }
 

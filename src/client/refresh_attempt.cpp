@@ -134,13 +134,16 @@ void RefreshAttempt::AskService() {
                             });
 }
 
+/// The provider may block for ever, and does not keep an attempt that has ended.
 void RefreshAttempt::Acquire() {
   m_supplies->credentials->Request(
-      [self = shared_from_this()](const Outcome<std::shared_ptr<const Credential>> &credential) {
+      [weak = weak_from_this()](const Outcome<std::shared_ptr<const Credential>> &credential) {
+        const std::shared_ptr<RefreshAttempt> self = weak.lock();
+        if (!self || self->m_isDecided.load()) {
+          return;
+        }
         try {
-          if (!self->m_isDecided.load()) {
-            self->OnCredential(*credential.Get());
-          }
+          self->OnCredential(*credential.Get());
         } catch (...) {
           self->Fail(std::current_exception());
         }

@@ -35,7 +35,7 @@ struct RefreshSupplies {
 
 /// Renews the token, or acquires one if that fails or is not possible. With a file cache, first looks into the file, and holds
 /// its lock while it asks the service, so that of many programs one asks. Ends with exactly one outcome, unless it is
-/// cancelled, and at the latest when its time is over. Safe on any thread.
+/// cancelled, and at the latest when its time is over. Its owner keeps it until then. Safe on any thread.
 class RefreshAttempt : public std::enable_shared_from_this<RefreshAttempt> {
 public:
   using Assess = std::function<CachedUse(const SamlToken &cached)>;

@@ -313,8 +313,9 @@ void TokenSourceCore::Close() noexcept {
   if (attempt) {
     attempt->Cancel();
   }
+  const std::exception_ptr closed = waiters.empty() ? nullptr : MakeClosed();
   for (const auto &waiter : waiters) {
-    waiter.second->Deliver(MakeClosed());
+    waiter.second->Deliver(closed);
   }
 }
 

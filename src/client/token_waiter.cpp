@@ -27,8 +27,8 @@ TokenWaiter::TokenWaiter(Executor executor, TokenCallback callback)
     : m_executor(std::move(executor)), m_callback(std::move(callback)) {}
 
 std::shared_ptr<TokenWaiter> TokenWaiter::Create(Executor executor, TokenCallback callback) {
-  const std::shared_ptr<TokenWaiter> waiter(new TokenWaiter(std::move(executor), std::move(callback)),
-                                            [](TokenWaiter *ended) { delete ended; });
+  std::shared_ptr<TokenWaiter> waiter(new TokenWaiter(std::move(executor), std::move(callback)),
+                                      [](TokenWaiter *ended) { delete ended; });
   waiter->m_delivery = [waiter] {
     const TokenCallback function = std::exchange(waiter->m_callback, nullptr);
     function(*waiter->m_outcome);
@@ -68,10 +68,9 @@ void TokenWaiter::Arm(const GetOptions &options, const CancelToken &otherToken, 
 void TokenWaiter::Keep(TimerItem timer, Registrations registrations) {
   {
     const std::lock_guard<Tarvel::ForkSafeMutex> lock(m_mutex);
-    m_timer.reset();
     if (!m_isDecided.load()) {
-      m_timer = std::move(timer);
-      m_registrations = std::move(registrations);
+      std::swap(m_timer, timer);
+      std::swap(m_registrations, registrations);
     }
   }
   if (timer) {

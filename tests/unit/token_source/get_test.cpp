@@ -6,6 +6,8 @@
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
 
+#include <thread>
+
 namespace Testing {
 
 using namespace SsoClient;
@@ -58,6 +60,25 @@ TEST(TokenSourceGet, ReturnsADueTokenAtOnceAndRefreshesItWithOneRequest) {
   stage.issuer->Answer(stage.Token("second", 1000s));
   EXPECT_EQ(stage.Ask(), "second");
   EXPECT_EQ(stage.issuer->Count(), 2U);
+}
+
+TEST(TokenSourceGet, NeedsNoLockForATokenThatCanBeReturned) {
+  SourceStage stage;
+  stage.Provide(stage.Token("first", 1000s));
+  stage.time.Advance(800s);
+  EXPECT_EQ(stage.Ask(), "first");
+  int reads = 0;
+  stage.whileLocked = [&] {
+    std::thread reader([&] {
+      EXPECT_EQ(stage.Source().Get({})->GetId(), "first");
+      EXPECT_EQ(stage.Ask(), "first");
+      ++reads;
+    });
+    reader.join();
+  };
+  stage.issuer->Answer(stage.Token("second", 1000s));
+  EXPECT_EQ(reads, 1);
+  EXPECT_EQ(stage.Ask(), "second");
 }
 
 } // namespace Testing

@@ -35,6 +35,9 @@ std::string Shorten(const std::string &outcome) {
 class ModelRun {
 public:
   explicit ModelRun(unsigned seed) : m_generator(seed) { StartSource(); }
+  ModelRun(const ModelRun &) = delete;
+  ModelRun &operator=(const ModelRun &) = delete;
+  ~ModelRun() { m_provided->clear(); }
 
   /// One random event, for the source and for the model.
   /// @return what differs; empty if nothing does
@@ -83,6 +86,9 @@ private:
       m_stage = std::make_unique<SourceStage>();
       m_model.wall = ReadClocks(m_stage->time).system;
     }
+    if (m_provided) {
+      m_provided->clear(); // its functions share it
+    }
     m_provided = std::make_shared<std::deque<std::function<void()>>>();
     m_stage->blocking = [provided = m_provided](std::function<void()> function) {
       provided->push_back(std::move(function));
@@ -118,7 +124,7 @@ private:
     if (event < 96) {
       return Invalidate();
     }
-    return event < 99 ? SetClock() : Draw(30) == 0 ? Destroy() : "nothing";
+    return event < 99 ? SetClock() : Draw(5) == 0 ? Destroy() : "nothing";
   }
 
   std::string Ask() {
@@ -167,7 +173,7 @@ private:
       const std::int64_t start = m_model.wall + Draw(3) * Draw(20 * SECOND) - Draw(10 * SECOND);
       token = {"t" + std::to_string(++m_tokens), start, start + Draw(Draw(4) == 0 ? 20 * SECOND : 1000 * SECOND),
                Draw(2) == 0};
-      token.id = Draw(50) == 0 ? "invalid" : token.id;
+      token.id = Draw(10) == 0 ? "invalid" : token.id;
     }
     m_stage->issuer->Answer(std::shared_ptr<const SamlToken>(std::make_shared<DatedToken>(
         token.id, token.start, token.end, token.isRenewable ? DatedToken::Kind::RENEWABLE : DatedToken::Kind::BEARER)));
@@ -223,7 +229,6 @@ private:
 
   std::mt19937 m_generator;
   SourceModel m_model;
-  std::unique_ptr<SourceStage> m_stage;
   std::shared_ptr<std::deque<std::function<void()>>> m_provided;
   bool m_isProviderWell = true;
   std::vector<std::string> m_events;
@@ -231,6 +236,7 @@ private:
   std::map<std::string, int> m_kinds;
   int m_calls = 0;
   int m_tokens = 0;
+  std::unique_ptr<SourceStage> m_stage; // last, because calls end when it is destroyed
 };
 
 } // namespace

@@ -54,6 +54,12 @@ std::size_t ManualIssuer::CountOpen() const {
   return count;
 }
 
+void ManualIssuer::Forget() {
+  std::deque<Request> forgotten; // destroyed outside the lock
+  const std::lock_guard<std::mutex> lock(m_mutex);
+  forgotten.swap(m_open);
+}
+
 void ManualIssuer::Answer(const TokenOutcome &outcome) {
   Request request;
   {
@@ -105,6 +111,7 @@ SourceStage::SourceStage()
 
 SourceStage::~SourceStage() {
   Close();
+  issuer->Forget();
 }
 
 TokenSourceCore &SourceStage::Source() {
@@ -112,7 +119,12 @@ TokenSourceCore &SourceStage::Source() {
     TokenSpec spec;
     spec.tokenLifetimeSec = 3600;
     m_source = std::make_shared<TokenSourceCore>(
-        TokenSourceSetup{time, issuer, provider, spec, options, cache, blocking, [this] { return random; }});
+        TokenSourceSetup{time, issuer, provider, spec, options, cache, blocking, [this] {
+                           if (whileLocked) {
+                             whileLocked();
+                           }
+                           return random;
+                         }});
   }
   return *m_source;
 }

@@ -42,6 +42,9 @@ public:
   /// Answers the oldest request that has not been answered.
   void Answer(const SsoClient::TokenOutcome &outcome);
 
+  /// Drops the requests that have not been answered. Their callbacks share the issuer.
+  void Forget();
+
 private:
   void Add(Request request) const;
 
@@ -82,7 +85,8 @@ public:
   SsoClient::CredentialProvider provider;
   SsoClient::Executor blocking;
   std::shared_ptr<const SsoClient::TokenCacheFile> cache;
-  double random = 0; ///< what the source's random numbers are
+  double random = 0;                 ///< what the source's random numbers are
+  std::function<void()> whileLocked; ///< called with each of them, while the source is locked
 
   SsoClient::TokenSourceCore &Source();
 
