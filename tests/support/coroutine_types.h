@@ -10,20 +10,35 @@
 
 #include <coroutine>
 #include <exception>
+#include <future>
+#include <memory>
 #include <optional>
 #include <utility>
 
 namespace Testing {
 
-/// Starts at once, and is destroyed with this object, whether or not it has ended. What it throws ends the process.
+/// Starts at once, and is destroyed with this object, whether or not it has ended. If it ends on another thread, call
+/// `WaitUntilDone` first. What it throws ends the process.
 class EagerTask {
 public:
   struct promise_type { // NOLINT(readability-identifier-naming): the language names it
+    /// Reports the end after the coroutine has been suspended for good. From then on it may be destroyed.
+    struct FinalAwaiter {
+      bool await_ready() const noexcept { return false; }
+      void await_suspend(std::coroutine_handle<promise_type> handle) const noexcept {
+        const std::shared_ptr<std::promise<void>> ended = handle.promise().ended; // outlives the coroutine
+        ended->set_value();
+      }
+      void await_resume() const noexcept {}
+    };
+
     EagerTask get_return_object() { return EagerTask(std::coroutine_handle<promise_type>::from_promise(*this)); }
     std::suspend_never initial_suspend() const noexcept { return {}; }
-    std::suspend_always final_suspend() const noexcept { return {}; }
+    FinalAwaiter final_suspend() const noexcept { return {}; }
     void return_void() const noexcept {}
     void unhandled_exception() const noexcept { std::terminate(); }
+
+    const std::shared_ptr<std::promise<void>> ended = std::make_shared<std::promise<void>>();
   };
 
   EagerTask(EagerTask &&other) noexcept : m_handle(std::exchange(other.m_handle, nullptr)) {}
@@ -35,6 +50,9 @@ public:
   }
 
   bool IsDone() const { return m_handle.done(); }
+
+  /// Waits until the coroutine has ended. May be called once.
+  void WaitUntilDone() const { m_handle.promise().ended->get_future().wait(); }
 
 private:
   explicit EagerTask(std::coroutine_handle<promise_type> handle) : m_handle(handle) {}

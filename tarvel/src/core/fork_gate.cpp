@@ -153,7 +153,7 @@ bool IsToRegister() noexcept {
   return false;
 }
 
-/// Called with each computation. No thread computes before the functions are registered: a fork that began earlier would
+/// Called with each computation, and when the number of forks is asked for. No thread computes before the functions are registered: a fork that began earlier would
 /// not wait for it. The C library registers nothing while a fork is under way.
 void RegisterOnce() noexcept {
   if (isRegistered.load(std::memory_order_acquire) || !IsToRegister()) {
@@ -208,6 +208,7 @@ void ForkSafeMutex::unlock() noexcept {
 }
 
 unsigned GetForkGeneration() noexcept {
+  RegisterOnce(); // what is made at this number, a child must recognise, even if nothing has computed before
   return generation.load(std::memory_order_relaxed);
 }
 

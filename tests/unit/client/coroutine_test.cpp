@@ -91,25 +91,30 @@ TEST(AwaitableOfTheClient, GivesTheResultOfEachOperation) {
   });
   const EagerTask acquired = Await(world.client->AcquireAwaitable(Alice(), SpecFor(60)), world.results);
   EXPECT_EQ(world.results.Wait(1), Strings{SUBJECT});
+  acquired.WaitUntilDone();
   const EagerTask renewed = Await(world.client->RenewAwaitable(Testing::HolderToken(), 60), world.results);
   EXPECT_EQ(world.results.Wait(2).back(), SUBJECT);
+  renewed.WaitUntilDone();
   const EagerTask validated = Await(world.client->ValidateAwaitable(Testing::HolderToken()), world.results);
   EXPECT_EQ(world.results.Wait(3).back(), "true");
+  validated.WaitUntilDone();
 }
 
 TEST(AwaitableOfTheClient, ThrowsFailuresInTheirOwnClass) {
   World world([](const Request &, int) -> boost::optional<Testing::Reply> { return Testing::NoConnection(); });
   const EagerTask unreachable = Await(world.client->AcquireAwaitable(Alice(), SpecFor(60)), world.results);
   EXPECT_EQ(world.results.Wait(1).back().substr(0, 24), "CommunicationException: ");
+  unreachable.WaitUntilDone();
   const EagerTask wrong = Await(world.client->ValidateAwaitable(nullptr), world.results);
   EXPECT_EQ(world.results.Wait(2).back().substr(0, 26), "InvalidArgumentException: ");
+  wrong.WaitUntilDone();
 }
 
 TEST(AwaitableOfTheClient, StartsNothingUntilItIsAwaited) {
   World world(Testing::Issue);
   { const auto dropped = world.client->AcquireAwaitable(Alice(), SpecFor(60)); }
   const EagerTask task = Await(world.client->AcquireAwaitable(Alice(), SpecFor(60)), world.results);
-  world.results.Wait();
+  task.WaitUntilDone();
   EXPECT_EQ(world.transport->Sent().size(), 1u);
 }
 
@@ -119,7 +124,7 @@ TEST(AwaitableOfTheClient, CancelsTheRequestWhenTheCoroutineIsDestroyed) {
     const EagerTask task = Await(world.client->AcquireAwaitable(Alice(), SpecFor(60)), world.results);
     ASSERT_TRUE(world.transport->WaitForSent(1));
   }
-  EXPECT_EQ(world.transport->CountCancelled(), 1);
+  EXPECT_TRUE(Eventually([&] { return world.transport->CountCancelled() == 1; }));
   EXPECT_TRUE(Eventually([&] { return world.transport->CountOpenSessions() == 0; }));
   EXPECT_EQ(world.results.Get(), Strings{}) << "continued";
 }
@@ -133,6 +138,7 @@ TEST(AwaitableOfTheClient, EndsWhenTheTokenOfItsOptionsIsCancelled) {
   ASSERT_TRUE(world.transport->WaitForSent(1));
   source.Cancel();
   EXPECT_EQ(world.results.Wait(), Strings{Testing::CANCELLED});
+  task.WaitUntilDone();
 }
 
 TEST(AwaitableOfTheClient, EndsWhenTheClientIsDestroyed) {
@@ -141,6 +147,7 @@ TEST(AwaitableOfTheClient, EndsWhenTheClientIsDestroyed) {
   ASSERT_TRUE(world.transport->WaitForSent(1));
   world.client.reset();
   EXPECT_EQ(world.results.Wait(), Strings{Testing::DESTROYED});
+  task.WaitUntilDone();
 }
 
 TEST(AwaitableOfTheClient, EndsAtOnceWhenTheClientWasDestroyedBefore) {
@@ -149,6 +156,7 @@ TEST(AwaitableOfTheClient, EndsAtOnceWhenTheClientWasDestroyedBefore) {
   world.client.reset();
   const EagerTask task = Await(std::move(awaitable), world.results);
   EXPECT_EQ(world.results.Wait(), Strings{Testing::DESTROYED});
+  task.WaitUntilDone();
   EXPECT_EQ(world.transport->Sent(), Strings{});
 }
 
@@ -190,6 +198,7 @@ TEST(AwaitableOfTheClient, WorksWithinOtherCoroutines) {
   World world(Testing::Issue);
   const EagerTask task = AcquireTwice(*world.client, world.results);
   EXPECT_EQ(world.results.Wait(), Strings{std::string(SUBJECT) + SUBJECT});
+  task.WaitUntilDone();
 }
 
 TEST(AwaitableOfTheClient, ServesManyCoroutinesOfWhichSomeAreDestroyed) {
@@ -204,9 +213,14 @@ TEST(AwaitableOfTheClient, ServesManyCoroutinesOfWhichSomeAreDestroyed) {
   for (std::size_t i = 0; i < tasks.size(); i += 3) {
     tasks[i].reset();
   }
-  EXPECT_EQ(world.transport->CountCancelled(), COUNT / 3);
+  EXPECT_TRUE(Eventually([&] { return world.transport->CountCancelled() == COUNT / 3; }));
   world.transport->AnswerHeld(Testing::Success("issued:" + Testing::BearerXml()));
   EXPECT_EQ(world.results.Wait(COUNT - COUNT / 3), Strings(COUNT - COUNT / 3, SUBJECT));
+  for (const std::unique_ptr<EagerTask> &task : tasks) {
+    if (task) {
+      task->WaitUntilDone();
+    }
+  }
   EXPECT_TRUE(Eventually([&] { return world.transport->CountOpenSessions() == 0; }));
 }
 
