@@ -9,7 +9,9 @@
 #include "operation/operation_events.h"
 #include "operation/returned_tokens.h"
 
+#include <cstddef>
 #include <mutex>
+#include <new>
 #include <utility>
 
 namespace SsoClient {
@@ -127,20 +129,32 @@ void ClientCore::Close() noexcept {
   }
 }
 
+namespace {
+
+/// Never releases the references in `operations`, and empties it. Needs no memory.
+void KeepForEver(OperationList &operations) noexcept {
+  struct Kept {
+    ForkSafeMutex mutex;
+    OperationList operations; // guarded by mutex
+  };
+  alignas(Kept) static std::byte storage[sizeof(Kept)];
+  static Kept *const kept = new (storage) Kept; // never destroyed
+  const std::lock_guard<ForkSafeMutex> lock(kept->mutex);
+  kept->operations.splice(kept->operations.end(), operations);
+}
+
+} // namespace
+
 void ClientCore::ForgetParent() noexcept {
   const std::lock_guard<ForkSafeMutex> lock(m_mutex);
   if (m_generation == Tarvel::GetForkGeneration()) {
     return;
   }
   m_generation = Tarvel::GetForkGeneration();
-  // The references are never released.
   for (const std::shared_ptr<ClientOperation> &operation : m_operations) {
     operation->place = boost::none;
   }
-  static Tarvel::ForkSafeMutex *const mutex = new Tarvel::ForkSafeMutex;
-  static OperationList *const kept = new OperationList;
-  const std::lock_guard<ForkSafeMutex> keptLock(*mutex);
-  kept->splice(kept->end(), m_operations);
+  KeepForEver(m_operations);
 }
 
 } // namespace SsoClient

@@ -120,7 +120,7 @@ private:
   void ForgetTask() noexcept;
   void Send(Request request);
   void StartMessageLimit(unsigned exchange, Clock::time_point end);
-  void KeepRequest(unsigned exchange, Item item) noexcept;
+  void KeepRequest(unsigned exchange, const Item &item) noexcept;
   void OnResponse(const Tarvel::Exception *failure, Tarvel::Reader *response) noexcept;
   void OnMessageLimit(unsigned exchange) noexcept;
   bool RetryLater();

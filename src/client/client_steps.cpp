@@ -185,7 +185,7 @@ void ClientOperation::OnMessageLimit(unsigned exchange) noexcept {
 }
 
 /// If the request's outcome has arrived, there is nothing to keep.
-void ClientOperation::KeepRequest(unsigned exchange, Item item) noexcept {
+void ClientOperation::KeepRequest(unsigned exchange, const Item &item) noexcept {
   std::shared_ptr<TransportSession> session;
   {
     const std::lock_guard<ForkSafeMutex> lock(m_mutex);
