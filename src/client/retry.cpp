@@ -16,7 +16,7 @@ namespace {
 using std::chrono::milliseconds;
 
 constexpr int SERVICE_UNAVAILABLE = 503;
-/// More digits than any time to wait for: a longer number means "never".
+/// A number with more digits is longer than any wait: it means "never".
 constexpr std::size_t MAX_DIGITS = 9;
 
 bool IsDigit(char c) noexcept {
@@ -32,7 +32,7 @@ milliseconds GetBackOff(const RetryPolicy &policy, int attempt) {
   return delay;
 }
 
-/// A connection was not made, so that the service has not received the request.
+/// Whether no connection was made, so that the service has not received the request.
 bool IsUnsent(const ResponseFacts &facts) noexcept {
   return facts.status == 0 && !facts.hasConnected;
 }

@@ -6,12 +6,12 @@
 /// `boost::asio::use_future` or `boost::asio::use_awaitable`. A handler gets a `std::exception_ptr`, null for a success, and the
 /// result.
 ///
-/// The handler is called once, never within the function that starts the operation, by the executor that is associated with
-/// it, which has work until then; without one, on a thread of the library (at most four), where it must not block. The
-/// handler's allocator allocates what its executor queues. What the start of the operation throws reaches the handler as
-/// well. If the execution context is destroyed first, the handler is destroyed and not called, as Asio does with all its
-/// handlers, and the operation is cancelled.
-/// In a child of `fork`, no handler of the parent is called; `notify_fork` destroys them.
+/// The handler is called once, never within the function that starts the operation. Its associated executor calls it,
+/// and has work until then. A handler without an executor is called on a thread of the library (at most four), where it
+/// must not block. The handler's allocator allocates what its executor queues. What the start of the operation throws
+/// is passed to the handler, too. If the execution context is destroyed first, the handler is destroyed and not called,
+/// like all handlers of Asio, and the operation is cancelled. In a child of `fork`, no handler of the parent is called;
+/// `notify_fork` destroys them.
 ///
 /// The operation is cancelled by `cancelToken` of the options, and, where Asio has cancellation slots (from Boost 1.77 on), by
 /// the handler's slot, with any type of cancellation.

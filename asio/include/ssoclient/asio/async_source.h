@@ -1,7 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// `AsyncGet`: the token of a `TokenSource` for programs that use Boost.Asio. All that `async_client.h` says about handlers holds
-/// here, too.
+/// `AsyncGet`: the token of a `TokenSource` for programs that use Boost.Asio. What `async_client.h` states about
+/// handlers is true here, too.
 
 #pragma once
 
