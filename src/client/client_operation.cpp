@@ -95,7 +95,7 @@ OperationEnding ClientOperation::RunToEnd() {
   return ending;
 }
 
-/// @return false when the time is up.
+/// @return false when the deadline or the time for the message has passed.
 bool ClientOperation::WaitForChange(std::unique_lock<ForkSafeMutex> &lock) {
   Clock::time_point limit = m_isDecided ? Clock::time_point::max() : m_messageEnd;
   if (!m_isDecided && m_deadline && *m_deadline < limit) {
@@ -256,8 +256,8 @@ void ClientOperation::Cancel(std::exception_ptr failure) noexcept {
   }
 }
 
-/// Decides how the operation ends. @return false when this was done before, and in a child of the process that started
-///         it.
+/// Decides how the operation ends. @return false when its end was decided before, and in a child of the process that
+///         started it.
 bool ClientOperation::Decide(OperationEnding ending) noexcept {
   Held held;
   Secrets released;

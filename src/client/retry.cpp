@@ -82,7 +82,7 @@ boost::optional<milliseconds> GetRetryDelay(const RetryPolicy &policy, int attem
   if (!demanded || *demanded > policy.longestDelay) {
     return boost::none;
   }
-  // The jitter comes after the time that the service demands, never before it.
+  // The delay with jitter is added to the time that the service demands, so no request is sent before that time.
   return std::min(*demanded + backOff, policy.longestDelay);
 }
 

@@ -36,7 +36,7 @@ public:
   /// The exclusive lock of the file, held until it is destroyed or the process ends. For one thread at a time.
   using Lock = Tarvel::PrivateFileLock;
 
-  /// Tries to take the lock; null when another program, or another lock of this one, has it.
+  /// Tries to lock the file; null when another program, or another lock of this program, has locked it.
   /// @throws Tarvel::IOException when the file is refused or cannot be made
   std::unique_ptr<Lock> TryLock() const { return m_file.TryLock(); }
 

@@ -9,7 +9,7 @@
 ///     ssoclient token cache 1
 ///     service: https://sts.corp.example/sts
 ///     owner: alice@corp.example
-///     options: strict
+///     options: profile=1:0 tokenType=0: appliesTo=0: useKey=1:0 delegation=1:0 identity=
 ///     lifetime: 3600
 ///     audience: https://billing.corp.example      (one line for each)
 ///     advice: urn:example:source                  (for each, with its attributes and their values in the next lines)

@@ -15,7 +15,7 @@ namespace SsoClient {
 
 namespace {
 
-/// The cache file that `options` describe; null without one.
+/// The cache file that `options` describe; null if they have no cache.
 std::shared_ptr<const TokenCacheFile> OpenCache(const std::shared_ptr<const ClientIssuer> &issuer,
                                                 const TokenSpec &spec, const TokenSourceOptions &options) {
   if (!options.cache) {

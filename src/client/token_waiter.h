@@ -55,8 +55,8 @@ private:
   bool Decide() noexcept;
 
   const Executor m_executor;
-  TokenCallback m_callback;         // used by the thread that runs it; then null
-  std::function<void()> m_delivery; // made early, so that a delivery needs no memory; null after the decision
+  TokenCallback m_callback;                // used by the thread that runs it; then null
+  std::function<void()> m_delivery;        // made early, so that a delivery needs no memory; null after the decision
   boost::optional<TokenOutcome> m_outcome; // set before the delivery
   std::atomic<bool> m_isDecided{false};
   Tarvel::ForkSafeMutex m_mutex; // guards all that follows

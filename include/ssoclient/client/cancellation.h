@@ -61,10 +61,10 @@ public:
     return m_state != nullptr;
   }
 
-  /// Calls `function` once when the source cancels, on the thread that cancels; at once, in this call, when it has cancelled
-  /// already. Functions are called in the order in which they were registered, and no lock is held: `function` may cancel,
-  /// register functions and remove them. It must not block. What it throws is logged (logger "SsoClient", level 8). In a
-  /// child that `fork` makes, the functions of its parent are not called.
+  /// Calls `function` once when the source cancels, on the thread that cancels. If the source has cancelled already,
+  /// calls it at once, in this call. Functions are called in the order in which they were registered, and no lock is
+  /// held: `function` may cancel, register functions and remove them. It must not block. What it throws is logged
+  /// (logger "SsoClient", level 8). In a child that `fork` makes, the functions of its parent are not called.
   /// @return what keeps the function registered, and frees its memory
   /// @throws Tarvel::InvalidArgumentException when `function` is empty
   /// @throws std::bad_alloc

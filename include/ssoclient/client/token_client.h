@@ -93,7 +93,7 @@ public:
   /// operation.
   std::shared_ptr<const SamlToken> Renew(const std::shared_ptr<const SamlToken> &token, std::int64_t lifetimeSec,
                                          const CallOptions &options = {}) const;
-  /// Whether the service says that `token` is valid. Waits for the end of the operation.
+  /// Whether the service reports that `token` is valid. Waits for the end of the operation.
   bool Validate(const std::shared_ptr<const SamlToken> &token, const CallOptions &options = {}) const;
 
   /// `Acquire` with a callback.

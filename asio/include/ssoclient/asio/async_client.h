@@ -28,8 +28,8 @@
 /// The client for programs that use Boost.Asio.
 namespace SsoClient::Asio {
 
-/// Acquires a token, as `TokenClient::AcquireAsync` does. The handler's signature is
-/// `void(std::exception_ptr, std::shared_ptr<const SamlToken>)`; the token is null when there is an exception.
+/// Acquires a token, like `TokenClient::AcquireAsync`. The handler's signature is `void(std::exception_ptr,
+/// std::shared_ptr<const SamlToken>)`; the token is null when there is an exception.
 /// @param client must exist until the operation starts, which `use_awaitable` and other lazy tokens do later
 /// @param options its executor is not used
 /// @return what the completion token returns, for example a `std::future<std::shared_ptr<const SamlToken>>`
@@ -45,7 +45,7 @@ auto AsyncAcquire(const TokenClient &client, Credential credential, TokenSpec sp
       });
 }
 
-/// Renews a token, as `TokenClient::RenewAsync` does. Parameters, signature and result as for `AsyncAcquire`.
+/// Renews a token, like `TokenClient::RenewAsync`. Parameters, signature and result as for `AsyncAcquire`.
 /// @throws std::bad_alloc
 template <typename CompletionToken>
 auto AsyncRenew(const TokenClient &client, std::shared_ptr<const SamlToken> renewed, std::int64_t lifetimeSec,
@@ -57,7 +57,7 @@ auto AsyncRenew(const TokenClient &client, std::shared_ptr<const SamlToken> rene
       });
 }
 
-/// Asks the service whether a token is valid, as `TokenClient::ValidateAsync` does. The handler's signature is
+/// Asks the service whether a token is valid, like `TokenClient::ValidateAsync`. The handler's signature is
 /// `void(std::exception_ptr, bool)`; parameters and result as for `AsyncAcquire`.
 /// @throws std::bad_alloc
 template <typename CompletionToken>

@@ -13,8 +13,8 @@
 
 namespace SsoClient::Asio {
 
-/// Gets a fresh token, as `TokenSource::GetAsync` does. The handler's signature is
-/// `void(std::exception_ptr, std::shared_ptr<const SamlToken>)`; the token is null when there is an exception.
+/// Gets a fresh token, like `TokenSource::GetAsync`. The handler's signature is `void(std::exception_ptr,
+/// std::shared_ptr<const SamlToken>)`; the token is null when there is an exception.
 /// @param source must exist until the operation starts, which `use_awaitable` and other lazy tokens do later
 /// @param options its executor is not used
 /// @return what the completion token returns, for example a `std::future<std::shared_ptr<const SamlToken>>`

@@ -16,16 +16,16 @@ class TARVEL_API ForkSafeMutex {
 public:
   /// Waits for the mutex, and for a fork that is under way.
   void lock();
-  /// Releases it. Called by the thread that holds it.
+  /// Releases the mutex. Called by the thread that has locked it.
   void unlock() noexcept;
 
 private:
   std::mutex m_mutex;
 };
 
-/// The number of forks between the process that first used the platform and this one. An object that was made at
-/// another number belongs to a parent: its threads do not exist here, and what it shares with the parent must not be
-/// touched. Safe on any thread.
+/// The number of forks between the process that first used the platform and this one. An object that was made when the
+/// number was another one belongs to a parent. Its threads do not exist here, and what it shares with the parent must
+/// not be touched. Safe on any thread.
 TARVEL_API unsigned GetForkGeneration() noexcept;
 
 } // namespace Tarvel
