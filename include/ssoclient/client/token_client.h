@@ -82,15 +82,15 @@ public:
   explicit TokenClient(std::shared_ptr<ClientCore> core) noexcept;
   TokenClient(const TokenClient &) = delete;
   TokenClient &operator=(const TokenClient &) = delete;
-  /// Cancels the operations that are under way. Waits for nothing; each callback still runs, on its executor. May be called in
-  /// a callback.
+  /// Cancels the operations that are under way, and does not wait. Each callback still runs, on its executor. May be
+  /// called in a callback.
   ~TokenClient();
 
   /// A new token for `credential`, as `spec` describes it. Waits for the end of the operation.
   std::shared_ptr<const SamlToken> Acquire(const Credential &credential, const TokenSpec &spec,
                                            const CallOptions &options = {}) const;
-  /// A token like `token`, which is holder-of-key and renewable, for `lifetimeSec` seconds from now. Waits for the end of the
-  /// operation.
+  /// A token like `token` that is valid for `lifetimeSec` seconds from now. `token` must be holder-of-key and
+  /// renewable. Waits for the end of the operation.
   std::shared_ptr<const SamlToken> Renew(const std::shared_ptr<const SamlToken> &token, std::int64_t lifetimeSec,
                                          const CallOptions &options = {}) const;
   /// Whether the service reports that `token` is valid. Waits for the end of the operation.

@@ -124,8 +124,8 @@ public:
               const TokenSourceOptions &options = {});
   TokenSource(const TokenSource &) = delete;
   TokenSource &operator=(const TokenSource &) = delete;
-  /// Cancels what is under way and waits for nothing. Each call that waits ends with `CancelledException`, on its executor.
-  /// A provider that is being called continues, and its credential is released.
+  /// Cancels what is under way, and does not wait. Each call that waits ends with `CancelledException`, on its
+  /// executor. A provider that is being called continues, and its credential is released.
   ~TokenSource();
 
   /// The token, never null. Waits if there is no token that can be returned. Safe on any thread.

@@ -10,8 +10,9 @@
 
 namespace Tarvel {
 
-/// A mutex that no child of `fork` finds locked: `fork` on another thread waits until it is released. So hold it briefly, and never
-/// while you wait for the network, for another thread or for the host's code. `std::condition_variable_any` releases it while it waits.
+/// A mutex that no child of `fork` finds locked: `fork` on another thread waits until it is released. So lock it only
+/// briefly, and release it before you wait for the network, for another thread or for the host's code.
+/// `std::condition_variable_any` releases the mutex while it waits.
 class TARVEL_API ForkSafeMutex {
 public:
   /// Waits for the mutex, and for a fork that is under way.

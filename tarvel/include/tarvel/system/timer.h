@@ -18,7 +18,8 @@ namespace Tarvel::System {
 /// the call if it has not begun, and soon releases what the function captures. An exception that the function throws is
 /// logged (logger "Tarvel", level 8). In a child that `fork` makes, the function of a timer of the parent is never
 /// called, and the item counts as done.
-/// @throws InvalidStateException when there is no I/O thread and none can be started; `std::bad_alloc`. The function is not called then.
+/// @throws InvalidStateException when there is no I/O thread and none can be started; `std::bad_alloc`. `function` is
+///         not called then.
 TARVEL_API Ref<ScheduledItem> StartTimer(std::chrono::steady_clock::time_point time, std::function<void()> function);
 
 } // namespace Tarvel::System

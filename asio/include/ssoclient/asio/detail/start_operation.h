@@ -56,8 +56,8 @@ private:
   Outcome<Value> m_outcome;
 };
 
-/// An operation and the handler that waits for it. Its memory is not from the handler's allocator: the library may share it
-/// until after the call of the handler, when the allocator may have been destroyed.
+/// An operation and the handler that waits for it. The memory of this object is not from the handler's allocator: the
+/// library may share the object until after the call of the handler, when the allocator may have been destroyed.
 template <typename Value, typename Handler>
 class HandledOperation final : public PendingOperation {
 public:
