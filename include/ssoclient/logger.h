@@ -13,7 +13,8 @@ namespace SsoClient {
 constexpr int LOG_LEVEL_OPERATION = 64;
 
 /// The level of warnings: about the leg that a negotiation handler returned for the service's final leg, and about an
-/// observer, a sink of refused tokens, a callback, an executor or a function of `CancelToken::OnCancel` that threw an exception.
+/// observer, a sink of refused tokens, a callback, an executor or a function of `CancelToken::OnCancel` that threw an
+/// exception, and about a token that could not be written to a file cache or removed from it.
 constexpr int LOG_LEVEL_CONTRACT_WARNING = 8;
 
 /// The library's logger. Its name is "SsoClient", and its level is 64 until the host sets another. It is made on first

@@ -22,7 +22,7 @@ void Log(const char *reason) noexcept {
   }
 }
 
-/// Tries again until it has the lock, as long as an attempt of another program may have it.
+/// Tries again until it has the lock, at most for the time of one attempt: another program may have the lock as long.
 class Removal : public std::enable_shared_from_this<Removal> {
 public:
   Removal(std::shared_ptr<const RefreshSupplies> supplies, std::string tokenId)

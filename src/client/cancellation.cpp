@@ -67,7 +67,7 @@ private:
     std::list<Entry *>::iterator place; // while it is listed; guarded by the state's mutex
   };
 
-  /// False when this has been cancelled.
+  /// @return false when this has been cancelled.
   bool Add(Entry &entry) {
     const std::lock_guard<Tarvel::ForkSafeMutex> lock(m_mutex);
     if (IsCancelled()) {
@@ -85,7 +85,8 @@ private:
     }
   }
 
-  /// Calls the function of the first entry, if its registration is not being destroyed. False when there is no entry.
+  /// Calls the function of the first entry, if its registration is not being destroyed. @return false when there is no
+  /// entry.
   bool CallFirst() noexcept {
     std::shared_ptr<Entry> entry; // its destructor takes the lock
     {

@@ -54,7 +54,7 @@ void ChangeListeners::ScheduleNext() noexcept {
   }
 }
 
-/// Makes one call, and schedules the next one even if it throws.
+/// Makes one call, and schedules the next one even if this call throws.
 void ChangeListeners::RunNext() {
   struct Finally {
     ChangeListeners &listeners;

@@ -30,10 +30,10 @@ public:
   /// Calls all registered functions with `token`, never in this call unless the executor does so. The caller holds no lock.
   void Publish(const std::shared_ptr<const SamlToken> &token);
 
-  /// Calls nothing more, except what is under way.
+  /// Starts no further call. A call that is under way continues.
   void Close() noexcept;
 
-  /// The calls of a parent process do not happen here.
+  /// In a child of `fork`: drops the calls of the parent.
   void ForgetCalls() noexcept;
 
 private:

@@ -20,7 +20,7 @@ namespace {
 
 using Tarvel::ForkSafeMutex;
 
-/// Fields that a description contains are quoted by their length, so that no two options have the same description.
+/// Writes the length of `value` before it, so that different options never have the same description.
 void Append(std::string &text, const char *name, const std::string &value) {
   text.append(text.empty() ? "" : " ").append(name).append("=").append(std::to_string(value.size()));
   text.append(":").append(value);

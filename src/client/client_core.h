@@ -25,7 +25,8 @@ class ClientOperation;
 /// The operations of a client that are under way.
 using OperationList = std::list<std::shared_ptr<ClientOperation>>;
 
-/// Holds the collaborators of a client and the list of its operations, which share it. Safe on any thread.
+/// Has the collaborators of a client and the list of its operations. The client and its operations share it. Safe on
+/// any thread.
 class ClientCore {
 public:
   /// The objects that tests replace.
@@ -53,7 +54,7 @@ public:
   const std::string &GetServiceUrl() const noexcept { return m_serviceUrl; }
   /// "" without an identity, otherwise the SHA-256 thumbprint of its certificate.
   std::string GetIdentityThumbprint() const;
-  /// What the options say about the tokens that the service issues and the client accepts, as one line of text.
+  /// What the options determine about the tokens that the service issues and the client accepts, as one line of text.
   std::string DescribeOptions() const;
   /// The token in `xml`, verified with the client's options.
   /// @throws what `TokenVerifier::Verify` throws.
@@ -64,7 +65,7 @@ public:
   /// Does nothing when the operation is not listed.
   void Remove(ClientOperation &operation) noexcept;
 
-  /// The client is being destroyed: cancels the operations, and those that start later.
+  /// The client is being destroyed: cancels its operations. Those that start later are cancelled, too.
   void Close() noexcept;
 
 private:

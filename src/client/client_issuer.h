@@ -15,7 +15,8 @@
 
 namespace SsoClient {
 
-/// Passes each call to the client, which it keeps. Its callbacks run on the library's own threads, wherever the operation ends.
+/// Passes each call to the client, which it keeps. Callbacks run on the thread that ends the operation, without an
+/// executor.
 class ClientIssuer final : public TokenIssuer {
 public:
   /// @throws Tarvel::InvalidArgumentException for null.

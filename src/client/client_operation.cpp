@@ -19,7 +19,7 @@ using Tarvel::ForkSafeMutex;
 using Tarvel::System::GetComputePool;
 using Tarvel::System::GetThreadPool;
 
-/// An exception, or the lack of memory for it.
+/// An exception; `std::bad_alloc` if there is no memory for it.
 template <typename Failure>
 std::exception_ptr MakeFailure(const char *message) noexcept {
   try {
@@ -95,7 +95,7 @@ OperationEnding ClientOperation::RunToEnd() {
   return ending;
 }
 
-/// @return false when the time is up.
+/// @return false when the deadline or the time for the message has passed.
 bool ClientOperation::WaitForChange(std::unique_lock<ForkSafeMutex> &lock) {
   Clock::time_point limit = m_isDecided ? Clock::time_point::max() : m_messageEnd;
   if (!m_isDecided && m_deadline && *m_deadline < limit) {
@@ -173,7 +173,7 @@ void ClientOperation::RegisterCancel() {
   }
 }
 
-/// Cancels `item` at the decision.
+/// Keeps `item` until the decision, which cancels it.
 void ClientOperation::Keep(Item Held::*member, Item item) noexcept {
   {
     const std::lock_guard<ForkSafeMutex> lock(m_mutex);
@@ -227,7 +227,7 @@ void ClientOperation::RunStep(Step step, bool isOnComputePool) noexcept {
   }
 }
 
-/// @return false when it has been decided how the operation ends.
+/// @return false when the end has been decided.
 bool ClientOperation::BeginStep() noexcept {
   const std::lock_guard<ForkSafeMutex> lock(m_mutex);
   if (m_isDecided || IsOfParent()) {
@@ -256,7 +256,8 @@ void ClientOperation::Cancel(std::exception_ptr failure) noexcept {
   }
 }
 
-/// @return false when that was done before, and in a child of the process that started the operation.
+/// Decides how the operation ends. @return false when its end was decided before, and in a child of the process that
+///         started it.
 bool ClientOperation::Decide(OperationEnding ending) noexcept {
   Held held;
   Secrets released;
@@ -281,7 +282,7 @@ bool ClientOperation::Decide(OperationEnding ending) noexcept {
   return true;
 }
 
-/// Neither the thread that cancels nor one that must not block runs the host's code.
+/// Finishes on another thread: neither a thread that cancels nor one that must not block should run the host's code.
 void ClientOperation::FinishElsewhere() noexcept {
   if (m_waiter) {
     const std::lock_guard<ForkSafeMutex> lock(m_mutex);
@@ -339,7 +340,7 @@ void ClientOperation::Complete() noexcept {
   }
 }
 
-/// The operation has not started. @return false when it was decided before how it ends.
+/// Ends an operation that has not started. @return false when its end was decided before.
 bool ClientOperation::Abandon(std::exception_ptr failure) noexcept {
   if (!Decide({std::move(failure), nullptr, false})) {
     return false;

@@ -29,17 +29,17 @@ namespace SsoClient {
 /// How an operation ended.
 struct OperationEnding {
   std::exception_ptr failure;             ///< null for a success
-  std::shared_ptr<const SamlToken> token; ///< of a success, unless it is a validation
+  std::shared_ptr<const SamlToken> token; ///< the result of a success; null after a validation
   bool isValid = false;                   ///< the result of a validation
 };
 
-/// A sequence of steps: compose, send, read; in a negotiation also the legs of the handler. Each step queues the next one,
-/// so no thread is held while the network is waited for.
+/// A sequence of steps: compose, send, read; in a negotiation also the legs of the handler. Each step queues the next
+/// one, so no thread of a pool waits for the network.
 ///
-/// Cancelling, the deadline, the end of the client and the regular end compete to decide how it ends; the first one wins,
-/// and the others do nothing. A step that runs at this moment goes on without effect: it sends nothing more, and no step
-/// follows. The observer's `OnEnded` comes before the outcome, and no event comes after it. What is secret is released at the
-/// decision, or, if a step uses it, at the end of that step.
+/// Cancelling, the deadline, the end of the client and the regular end compete to decide how the operation ends. The
+/// first one decides, and the others do nothing. A step that runs at the decision continues without effect: it sends
+/// nothing more, and no step follows. The observer's `OnEnded` is called before the outcome is delivered, and no event
+/// follows `OnEnded`. Secrets are released at the decision, or, if a step uses them, at the end of that step.
 ///
 /// In a child of `fork`, the operations of the parent do nothing.
 class ClientOperation final : public std::enable_shared_from_this<ClientOperation>, private EventsEndListener {
@@ -62,7 +62,7 @@ public:
   /// @throws the failure with which it ended.
   OperationEnding RunToEnd();
 
-  /// Ends the operation with `failure` if it has not been decided how it ends.
+  /// Ends the operation with `failure`, unless its end has been decided.
   void Cancel(std::exception_ptr failure) noexcept;
 
   /// The place in the client's list; used under the lock of the list.
@@ -70,7 +70,7 @@ public:
 
 private:
   using Clock = CallOptions::Clock;
-  /// Runs a part of the operation. @return the ending if that is known then.
+  /// Runs a part of the operation. @return the ending, if this step decides it.
   using Step = boost::optional<OperationEnding> (ClientOperation::*)();
   using Item = Tarvel::Ref<Tarvel::System::ScheduledItem>;
 
@@ -165,7 +165,7 @@ private:
 
   // Used by the step that runs.
   std::shared_ptr<const TokenSteps> m_steps;
-  std::exception_ptr m_refusal; // of the options of the call
+  std::exception_ptr m_refusal; // why the options of the call are not valid
   std::shared_ptr<TransportSession> m_session;
   std::shared_ptr<ResponseFacts> m_facts;
   std::exception_ptr m_responseFailure;
@@ -178,9 +178,9 @@ private:
   int m_runningSteps = 0;
   unsigned m_exchange = 0;                                   // the number of the last request
   bool m_isLate = false;                                     // its time-out has passed
-  Clock::time_point m_messageEnd = Clock::time_point::max(); // when that happens
+  Clock::time_point m_messageEnd = Clock::time_point::max(); // when its time-out passes
   Held m_held;
-  OperationEnding m_ending; // once it is decided
+  OperationEnding m_ending; // set at the decision
   Completion m_completion;
   bool m_completesHere = false;
   std::unique_ptr<Waiter> m_waiter; // null unless a thread waits

@@ -20,7 +20,7 @@ namespace {
 using std::chrono::milliseconds;
 using Tarvel::ForkSafeMutex;
 
-/// A response that is longer is not read by a thread that waits for the operation, because that takes long.
+/// A thread that waits for the operation does not read a longer response, because reading it takes long.
 constexpr std::size_t LONG_RESPONSE_BYTES = 1024 * 1024;
 
 /// No delay is longer, so that no addition overflows.
@@ -75,7 +75,7 @@ boost::optional<OperationEnding> ClientOperation::Compose() {
   return boost::none;
 }
 
-/// The task is not needed after the last attempt has been composed.
+/// The task is not needed after the request of the last attempt has been composed.
 void ClientOperation::ForgetTask() noexcept {
   if (m_attempt >= m_retryPolicy.attempts) {
     m_secrets.task = nullptr;
@@ -136,7 +136,7 @@ void ClientOperation::Send(Request request) {
     m_held.session = session;
     m_isLate = false;
     if (m_waiter) {
-      m_waiter->changed.notify_one(); // it waits until the new limit
+      m_waiter->changed.notify_one(); // that thread must use the new limit
     }
   }
   Item item;
@@ -184,7 +184,7 @@ void ClientOperation::OnMessageLimit(unsigned exchange) noexcept {
   }
 }
 
-/// If the request's outcome has arrived, there is nothing to keep.
+/// Keeps `item`, which cancels the request. If the request's outcome has arrived, there is nothing to keep.
 void ClientOperation::KeepRequest(unsigned exchange, const Item &item) noexcept {
   std::shared_ptr<TransportSession> session;
   {
@@ -285,8 +285,8 @@ OperationEnding ClientOperation::EndWithToken(std::shared_ptr<const SamlToken> t
   return {nullptr, std::move(token), false};
 }
 
-/// Repeats the whole attempt later if the service cannot have acted upon it. It has acted upon a negotiation's first leg
-/// when a later one fails.
+/// Repeats the whole attempt later if the service cannot have acted upon it. When a later leg of a negotiation fails,
+/// the service has acted upon the first one.
 bool ClientOperation::RetryLater() {
   if (m_attempt >= m_retryPolicy.attempts || m_leg > 1) {
     return false;

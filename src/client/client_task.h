@@ -18,24 +18,24 @@
 
 namespace SsoClient {
 
-/// To issue a token.
+/// Asks the service to issue a token.
 struct Acquisition {
   Credential credential;
   TokenSpec spec;
 };
 
-/// To renew a token.
+/// Asks the service to renew a token.
 struct Renewal {
   std::shared_ptr<const SamlToken> token; ///< null is refused when the operation runs
   std::int64_t lifetimeSec = 0;
 };
 
-/// To say whether a token is valid.
+/// Asks the service whether a token is valid.
 struct Validation {
   std::shared_ptr<const SamlToken> token; ///< null is refused when the operation runs
 };
 
-/// Any of them.
+/// Any of these tasks.
 using ClientTask = std::variant<Acquisition, Renewal, Validation>;
 
 /// How the messages of an operation are made and read.
@@ -44,7 +44,7 @@ enum class TaskKind : unsigned char { ISSUE, NEGOTIATE, RENEW, VALIDATE };
 /// The kind of `task`.
 TaskKind KindOf(const ClientTask &task) noexcept;
 
-/// The name of the operation in the log and for observers: that of the function of `SecurityTokenService`.
+/// The name of the operation in the log and for observers: the name of the function of `SecurityTokenService`.
 const char *NameOf(const ClientTask &task) noexcept;
 
 /// Composes the only request of `task`, which is not a negotiation.

@@ -14,8 +14,9 @@
 
 namespace SsoClient {
 
-/// A provider may block for ever, and an attempt does not wait for ever. So a call of the provider does not belong to an
-/// attempt: while one is under way, no other begins, and its result is for the attempt that waits for it then.
+/// A provider may block for ever, but an attempt ends at its deadline. So a call of the provider does not belong to an
+/// attempt. While a call is under way, no other call begins, and the attempt that waits when the call ends gets its
+/// result.
 class CredentialRequests : public std::enable_shared_from_this<CredentialRequests> {
 public:
   using Callback = std::function<void(const Outcome<std::shared_ptr<const Credential>> &)>;
@@ -27,7 +28,7 @@ public:
   /// @throws what the executor throws, `std::bad_alloc`; the callback is not called then
   void Request(Callback callback);
 
-  /// The call of a parent process does not exist here.
+  /// In a child of `fork`: the call of the parent does not exist here.
   void ForgetCall() noexcept;
 
 private:

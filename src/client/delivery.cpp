@@ -23,7 +23,7 @@ void Call(const std::function<void()> &function) noexcept {
   }
 }
 
-/// A function that runs once, on whichever thread is the first to run it, but not in a child of this process.
+/// A function that runs once, on the first thread that calls `Run`, but not in a child of this process.
 class Delivery {
 public:
   /// Called before the object is shared.
@@ -53,7 +53,7 @@ void RunOnComputePool(const std::shared_ptr<Delivery> &delivery) noexcept {
   }
 }
 
-/// Shared by the copies of the function that an executor gets. When the last one is destroyed without having been
+/// Shared by the copies of the function that an executor gets. If the last copy is destroyed before any copy was
 /// called, the executor has dropped the function.
 class Order {
 public:

@@ -10,10 +10,10 @@
 
 namespace SsoClient {
 
-/// Runs `function` once on `executor`; if that is empty, throws, or destroys the function without running it, on a compute
-/// thread of the platform, and if none can be started, in this call. What `function` or `executor` throws is logged. In a
-/// child of the process that called this, the function is not run. Called without a lock, because an executor may run the
-/// function at once.
+/// Runs `function` once on `executor`. If the executor is empty, throws, or destroys the function without running it,
+/// the function runs on a compute thread of the platform. If no such thread can be started, it runs in this call. What
+/// `function` or `executor` throws is logged. In a child of the process that called this, the function is not run. The
+/// caller holds no lock, because an executor may run the function at once.
 /// @param function not empty; released on the thread that has run it
 void RunOn(const Executor &executor, std::function<void()> function) noexcept;
 

@@ -31,7 +31,8 @@ struct alignas(NODE_ALIGNMENT) PublishedToken::Node {
   std::atomic<std::int64_t> readers{0};
 };
 
-/// 0 if the address does not fit, as with tagged addresses: readers then find nothing and go the way of an unpublished token.
+/// 0 if the address has more bits, for example a tagged address. Readers then find nothing, as if no token were
+/// published.
 std::uint64_t PublishedToken::ToWord(const Node *node) noexcept {
   const std::uint64_t address = reinterpret_cast<std::uintptr_t>(node);
   return address >> ADDRESS_BITS == 0 ? address >> ALIGNMENT_BITS : 0;

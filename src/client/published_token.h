@@ -12,9 +12,10 @@
 
 namespace SsoClient {
 
-/// A token and the time in which it may be returned without further thought. Any number of threads read it, and no reader waits
-/// for another one: a reader counts itself into the word that has the address of the token, copies the token, and counts
-/// itself out again. The writer replaces the word and takes over its count, and whoever is the last releases the old token.
+/// A token and the time in which it may be returned without a further check. Any number of threads read it, and no
+/// reader waits for another one. A reader increments the count in the word that has the address of the token, copies
+/// the token, and decrements the count. The writer replaces the word and takes over its count. The last user of the old
+/// token releases it.
 ///
 /// Times are microseconds since 1970, UTC.
 class PublishedToken {
@@ -29,10 +30,10 @@ public:
 
   /// Makes readers find `token`. One thread at a time calls this and the functions below.
   /// @param token not null
-  /// @throws std::bad_alloc, then nothing has changed
+  /// @throws std::bad_alloc; nothing has changed then
   void Publish(std::shared_ptr<const SamlToken> token, std::int64_t from, std::int64_t until);
 
-  /// Changes the time of the published token, if there is one.
+  /// Changes the end of the time of the published token, if there is one.
   void SetUntil(std::int64_t until) noexcept;
 
   /// Makes readers find nothing.

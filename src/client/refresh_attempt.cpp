@@ -73,8 +73,8 @@ void RefreshAttempt::OpenCache() {
   m_supplies->blocking(MakeStep(&RefreshAttempt::LookIntoCache));
 }
 
-/// Asks the service if the file has no fresh token and this program has locked the file. If another program has locked it, that one
-/// asks.
+/// If the file has no fresh token, locks the file and asks the service. If another program has locked the file, that
+/// program asks.
 void RefreshAttempt::LookIntoCache() {
   if (UseCached()) {
     return;
@@ -134,7 +134,7 @@ void RefreshAttempt::AskService() {
                             });
 }
 
-/// The provider may block for ever, and does not keep an attempt that has ended.
+/// The callback does not own the attempt, because the provider may block longer than the attempt lasts.
 void RefreshAttempt::Acquire() {
   m_supplies->credentials->Request(
       [weak = weak_from_this()](const Outcome<std::shared_ptr<const Credential>> &credential) {
@@ -183,7 +183,8 @@ void RefreshAttempt::OnIssued(const TokenOutcome &outcome) {
   }
 }
 
-/// A program that ends after its first token leaves it for the next one, so the token is written before it is returned.
+/// The token is written before it is returned, so that a program that ends after its first token leaves it to the next
+/// program.
 void RefreshAttempt::WriteCache() {
   std::shared_ptr<const SamlToken> issued;
   std::unique_ptr<TokenCacheFile::Lock> fileLock;
@@ -217,7 +218,7 @@ void RefreshAttempt::End(const TokenOutcome &outcome, bool isIssued) noexcept {
   }
 }
 
-/// A token that the attempt has already is better than the failure.
+/// If the attempt has a token already, it ends with that instead of the failure.
 void RefreshAttempt::Fail(const std::exception_ptr &failure) noexcept {
   std::shared_ptr<const SamlToken> fallback;
   bool isIssued = false;
@@ -234,7 +235,7 @@ void RefreshAttempt::Fail(const std::exception_ptr &failure) noexcept {
 }
 
 /// Ends the attempt: stops the timer and unlocks the file.
-/// @return whom the caller must notify; null if the attempt has ended before
+/// @return the function that the caller must call; null if the attempt has ended before
 RefreshAttempt::Ended RefreshAttempt::Decide() noexcept {
   Ended ended;
   Tarvel::Ref<Tarvel::System::ScheduledItem> timer;

@@ -33,9 +33,10 @@ struct RefreshSupplies {
   std::chrono::milliseconds timeout;
 };
 
-/// Renews the token, or acquires one if that fails or is not possible. With a file cache, first looks into the file, and holds
-/// its lock while it asks the service, so that of many programs one asks. Ends with exactly one outcome, unless it is
-/// cancelled, and at the latest when its time is over. Its owner keeps it until then. Safe on any thread.
+/// Renews the token, or acquires one if the renewal fails or is not possible. With a file cache, it first looks into
+/// the file, and holds the lock of the file while it asks the service, so that only one of many programs asks. It ends
+/// with exactly one outcome, unless it is cancelled, and at the latest when its time is over. Its owner keeps it until
+/// then. Safe on any thread.
 class RefreshAttempt : public std::enable_shared_from_this<RefreshAttempt> {
 public:
   using Assess = std::function<CachedUse(const SamlToken &cached)>;
@@ -54,7 +55,7 @@ public:
   /// Ends the attempt without an outcome.
   void Cancel() noexcept;
 
-  /// The token that is renewed has been refused by a service.
+  /// A relying party has refused the token that is being renewed.
   void ForbidRenewal() noexcept { m_isRenewalForbidden.store(true); }
 
 private:
@@ -87,7 +88,8 @@ private:
   Ended m_ended;                 // null after the decision
   Tarvel::Ref<Tarvel::System::ScheduledItem> m_timer;
   std::unique_ptr<TokenCacheFile::Lock> m_lock;
-  // What the attempt has, if all else fails: a token of the file that is due, or the issued one, while it is written.
+  // The attempt ends with this token if it fails: a token of the file that is due, or the issued one, while it is
+  // written.
   std::shared_ptr<const SamlToken> m_fallback;
   bool m_isFallbackIssued = false;
 };

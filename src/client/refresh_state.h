@@ -19,7 +19,7 @@
 
 namespace SsoClient {
 
-/// What a token of the file cache is for a source.
+/// How a source may use a token of the file cache.
 enum class CachedUse {
   NO,   ///< it is not returned
   DUE,  ///< it may be returned, and must be refreshed
@@ -30,7 +30,7 @@ enum class CachedUse {
 /// what must be done. For one thread at a time.
 ///
 /// The token of the source is absent, fresh, due or not usable. A fresh or a due token is returned. One attempt at a
-/// time gets another one; after a failed attempt there is none for some time.
+/// time gets another one; after a failed attempt, no other is made for some time.
 class RefreshState {
 public:
   using SteadyTime = RefreshTimes::SteadyTime;
@@ -58,7 +58,8 @@ public:
   /// A caller asks for the token.
   Decision Ask(const Moment &now);
 
-  /// The time that `GetTimer` returned has come: a due token that callers ask for is refreshed, and an ended one is dropped.
+  /// The time that `GetTimer` returned has been reached. A due token that callers ask for is refreshed, and an ended
+  /// one is dropped.
   /// @param isAsked whether a caller has asked since the last attempt ended
   /// @return whether the caller must start an attempt
   bool OnTimer(const Moment &now, bool isAsked) noexcept;
@@ -67,10 +68,11 @@ public:
   /// @param isIssued whether the service has issued the token for this attempt; otherwise it is from a file
   Result OnAttemptEnded(const Moment &now, const TokenOutcome &outcome, bool isIssued);
 
-  /// What a token of the file cache is now.
+  /// How a token of the file cache may be used now.
   CachedUse Assess(const Moment &now, const SamlToken &cached) const;
 
-  /// The attempt that was started does not exist.
+  /// No attempt is under way: the one that was started could not be created, has failed, or is the parent's in a child
+  /// of `fork`.
   void ForgetAttempt() noexcept { m_isAttempting = false; }
 
   /// The token with this identifier is not returned again.
@@ -90,7 +92,7 @@ public:
   /// The token if it can be renewed; otherwise null.
   std::shared_ptr<const SamlToken> GetRenewable(const Moment &now) const;
 
-  /// Until which wall-clock time a caller may be given the token without `Ask`.
+  /// Until which wall-clock time callers may get the token without `Ask`; microseconds since 1970, UTC.
   std::int64_t GetQuietUntil(const Moment &now) const noexcept;
 
   /// When `OnTimer` must be called, if nothing else happens before.

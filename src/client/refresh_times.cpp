@@ -19,7 +19,7 @@ constexpr std::int64_t LONGEST_TIME = std::int64_t{10} * 365 * 24 * 3600 * Tarve
 /// The margin is at most this part of the lifetime.
 constexpr std::int64_t MARGIN_PARTS = 10;
 
-/// The time on the steady clock at which the wall clock is `system`, unless it is set in between.
+/// The time on the steady clock at which the wall clock is `system`, unless the wall clock is set in between.
 RefreshTimes::SteadyTime ToSteady(std::int64_t system, const Moment &now) noexcept {
   return now.steady + microseconds(std::clamp(system - now.system, -LONGEST_TIME, LONGEST_TIME));
 }
@@ -37,11 +37,11 @@ RefreshTimes PlanRefresh(const SamlToken &token, const Moment &now, bool isIssue
   RefreshTimes times;
   times.end = token.GetEndDate().GetUtcTime();
   const std::int64_t margin = std::min(microseconds(options.expiryMargin).count(), (times.end - start) / MARGIN_PARTS);
-  // The clock of the service may be ahead. A token that was accepted is used, and the margin at its end covers that the clock
-  // here is set back by the same time.
+  // The clock of the service may be ahead, so an accepted token is usable from now on. The margin allows for a clock
+  // that is set back here by as much.
   times.usableFrom = std::min(start, now.system) - margin;
   times.usableUntil = times.end - margin;
-  // If the clock of the service is slow, each new token would be due at once, again and again.
+  // Without this, each new token would be due at once if the clock of the service were slow.
   const std::int64_t base = isIssued ? std::max(start, now.system) : start;
   const double part = options.refreshAt - options.jitter * random;
   const std::int64_t due = base + static_cast<std::int64_t>(part * static_cast<double>(times.end - base));

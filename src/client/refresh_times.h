@@ -13,25 +13,25 @@
 
 namespace SsoClient {
 
-/// One moment, on both clocks. Only the wall clock can be compared with the dates of a token, and only the steady clock is not
-/// set by anyone.
+/// One moment, on both clocks. Only the wall clock can be compared with the dates of a token, and only the steady clock
+/// is never set.
 struct Moment {
   std::int64_t system = 0; ///< microseconds since 1970, UTC
   TimeSource::SteadyClock::time_point steady;
 };
 
-/// What the two clocks say now.
+/// The present time on both clocks.
 Moment ReadClocks(const TimeSource &time) noexcept;
 
-/// The times of one token, computed from its own dates when it was received. A clock that is set afterwards makes the token end early,
-/// never late: it ends on either clock.
+/// The times of one token, computed from its own dates when it was received. If a clock is set afterwards, the token
+/// may end early, but never late: it ends when either clock reaches its end.
 struct RefreshTimes {
   using SteadyTime = TimeSource::SteadyClock::time_point;
 
   std::int64_t usableFrom = 0;
   std::int64_t dueAt = 0; ///< not after `usableUntil`
   std::int64_t usableUntil = 0;
-  std::int64_t end = 0; ///< the token's own
+  std::int64_t end = 0; ///< the end that the token states
   SteadyTime steadyDueAt;
   SteadyTime steadyUntil;
 

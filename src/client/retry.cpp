@@ -16,7 +16,7 @@ namespace {
 using std::chrono::milliseconds;
 
 constexpr int SERVICE_UNAVAILABLE = 503;
-/// More digits than any time to wait for: a longer number means "never".
+/// A number with more digits is longer than any wait: it means "never".
 constexpr std::size_t MAX_DIGITS = 9;
 
 bool IsDigit(char c) noexcept {
@@ -32,7 +32,7 @@ milliseconds GetBackOff(const RetryPolicy &policy, int attempt) {
   return delay;
 }
 
-/// A connection was not made, so that the service has not received the request.
+/// Whether no connection was made, so that the service has not received the request.
 bool IsUnsent(const ResponseFacts &facts) noexcept {
   return facts.status == 0 && !facts.hasConnected;
 }
@@ -82,7 +82,7 @@ boost::optional<milliseconds> GetRetryDelay(const RetryPolicy &policy, int attem
   if (!demanded || *demanded > policy.longestDelay) {
     return boost::none;
   }
-  // The jitter comes after the time that the service demands, never before it.
+  // The delay with jitter is added to the time that the service demands, so no request is sent before that time.
   return std::min(*demanded + backOff, policy.longestDelay);
 }
 

@@ -18,15 +18,15 @@ namespace SsoClient {
 /// @throws Tarvel::InvalidArgumentException for less than one attempt, and for a negative delay.
 void CheckRetryPolicy(const RetryPolicy &policy);
 
-/// The time that a value of the header `Retry-After` demands, which is a number of seconds or a date; 0 for a date in the
-/// past, `boost::none` for anything else.
+/// The time that a value of the header `Retry-After` demands. The value is a number of seconds or a date. 0 for a date
+/// in the past, `boost::none` for any other value.
 boost::optional<std::chrono::milliseconds> ReadRetryAfter(const std::string &value,
                                                           std::chrono::system_clock::time_point now);
 
-/// How long to wait before a request is repeated that failed with a `CommunicationException`; `boost::none` when it is not
-/// repeated.
+/// How long to wait before a request that failed with a `CommunicationException` is repeated; `boost::none` when it is
+/// not repeated.
 /// @param attempt the number of the attempt that failed, from 1
-/// @param facts of its response
+/// @param facts those of its response
 /// @param random from 0 to 1, for the jitter
 boost::optional<std::chrono::milliseconds> GetRetryDelay(const RetryPolicy &policy, int attempt,
                                                          const ResponseFacts &facts,

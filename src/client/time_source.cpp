@@ -15,7 +15,7 @@ class SystemTimeSource final : public TimeSource {
 public:
   SystemClock::time_point GetSystemTime() const noexcept override {
 #ifdef CLOCK_REALTIME_COARSE
-    // The time of the last tick, which takes a fraction of the time to read.
+    // The time of the last tick of the system, because it is read much faster.
     std::timespec time{};
     if (::clock_gettime(CLOCK_REALTIME_COARSE, &time) == 0) {
       return SystemClock::time_point(std::chrono::duration_cast<SystemClock::duration>(

@@ -24,7 +24,8 @@ public:
 
   virtual SteadyClock::time_point GetSteadyTime() const noexcept = 0;
 
-  /// Calls `function` once at `time` or soon after, on an I/O thread, where it must not block; the item cancels that.
+  /// Calls `function` once at `time` or soon after, on an I/O thread, where it must not block. The returned item
+  /// cancels the call.
   /// @throws Tarvel::InvalidStateException when there is no I/O thread and none can be started; std::bad_alloc
   virtual Tarvel::Ref<Tarvel::System::ScheduledItem> StartTimer(SteadyClock::time_point time,
                                                                 std::function<void()> function) const = 0;

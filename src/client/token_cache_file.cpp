@@ -22,7 +22,7 @@ std::shared_ptr<const SamlToken> TokenCacheFile::Read() const {
   }
   try {
     std::shared_ptr<const SamlToken> token = m_verify(std::string(cached->xml));
-    // `Remove` goes by the identifier that the file states.
+    // `Remove` compares the identifier that the file states, so it must be the token's.
     return token && CacheValue(token->GetId()) == cached->id ? token : nullptr;
   } catch (const SsoException &) {
     return nullptr;

@@ -20,7 +20,7 @@ struct CacheBinding {
   std::string serviceUrl;
   std::string owner; ///< user name, principal, or "certificate:" and the SHA-256 thumbprint; never a secret
   TokenSpec spec;
-  std::string options; ///< what else decides about the token, for example the names of dialect and profile
+  std::string options; ///< what else determines the token, for example its profile and its type
 };
 
 /// Safe on any thread. Its functions block: they read and write files. None of them waits for another program.
@@ -36,18 +36,19 @@ public:
   /// The exclusive lock of the file, held until it is destroyed or the process ends. For one thread at a time.
   using Lock = Tarvel::PrivateFileLock;
 
-  /// Tries to take the lock; null when another program, or another lock of this one, has it.
+  /// Tries to lock the file; null when another program, or another lock of this program, has locked it.
   /// @throws Tarvel::IOException when the file is refused or cannot be made
   std::unique_ptr<Lock> TryLock() const { return m_file.TryLock(); }
 
-  /// The token of this binding, verified again; null when there is none: no file, an empty, truncated or foreign one, another
-  /// binding, a token that is refused now. Needs no lock.
-  /// @throws Tarvel::IOException when the file is refused (a link, another owner, a mode that lets others in) or cannot be read;
-  ///         what `verify` throws, unless it is the refusal of a token
+  /// The token of this binding, verified again. Null when there is no file, or when the file is empty, truncated or not
+  /// a token cache, has another binding, or has a token that is refused now. Needs no lock.
+  /// @throws Tarvel::IOException when the file is refused (a link, another owner, a mode that lets other users read or
+  ///         write it) or cannot be read; what `verify` throws, unless it is the refusal of a token
   std::shared_ptr<const SamlToken> Read() const;
 
   /// Replaces the content as a whole; readers see the old or the new content.
-  /// @throws Tarvel::IOException when it cannot be written, for example on a full disk; the old content then stays, and no other file is left.
+  /// @throws Tarvel::IOException when it cannot be written, for example on a full disk; the old content then stays, and
+  ///         no other file remains.
   void Write(Lock &lock, const SamlToken &token) const;
 
   /// Removes the token from the file, if it is the one with this identifier and has this binding.

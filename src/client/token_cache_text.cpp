@@ -63,7 +63,7 @@ bool Take(std::string_view &rest, std::string_view expected) {
   return true;
 }
 
-/// Removes a line from `rest` and sets `value` to what is after its name; false if `rest` begins with another line.
+/// Removes a line from `rest` and sets `value` to what follows its name; false if `rest` begins with another line.
 bool TakeLine(std::string_view &rest, std::string_view name, std::string_view &value) {
   const std::size_t end = rest.find('\n');
   if (end == std::string_view::npos || !Take(rest, name)) {

@@ -2,13 +2,14 @@
 /// @file
 /// The content of a token cache file.
 ///
-/// It is text. Each line but those of the token has a name, a colon and a blank before its value, in which a backslash and
-/// each control character is written as a backslash, "x" and two hexadecimal digits:
+/// The file is text. Each line has a name, a colon, a blank and a value, except the first and the last line and those
+/// of the token. In a value, a backslash and each control character is written as a backslash, "x" and two hexadecimal
+/// digits:
 ///
 ///     ssoclient token cache 1
 ///     service: https://sts.corp.example/sts
 ///     owner: alice@corp.example
-///     options: strict
+///     options: profile=1:0 tokenType=0: appliesTo=0: useKey=1:0 delegation=1:0 identity=
 ///     lifetime: 3600
 ///     audience: https://billing.corp.example      (one line for each)
 ///     advice: urn:example:source                  (for each, with its attributes and their values in the next lines)
@@ -37,9 +38,9 @@
 
 namespace SsoClient {
 
-/// A token as a cache file has it. Views into the text.
+/// A token in the text of a cache file. The members are views into the text.
 struct CachedToken {
-  std::string_view id; ///< as the file has it
+  std::string_view id; ///< as it is written in the file
   std::string_view xml;
 };
 
@@ -47,12 +48,12 @@ struct CachedToken {
 /// @throws std::bad_alloc
 std::string WriteCacheText(const CacheBinding &binding, const SamlToken &token);
 
-/// The token in the text; nothing if the text is not complete, has another version or another binding.
+/// The token in the text; `boost::none` if the text is not complete, or has another version or another binding.
 /// @param text must exist as long as the result is used
 /// @throws std::bad_alloc
 boost::optional<CachedToken> FindCachedToken(std::string_view text, const CacheBinding &binding);
 
-/// A value in the form in which the file has it.
+/// A value as it is written in the file.
 /// @throws std::bad_alloc
 std::string CacheValue(std::string_view value);
 

@@ -15,7 +15,7 @@ namespace SsoClient {
 
 namespace {
 
-/// The cache file that `options` describe; null without one.
+/// The cache file that `options` describe; null if they have no cache.
 std::shared_ptr<const TokenCacheFile> OpenCache(const std::shared_ptr<const ClientIssuer> &issuer,
                                                 const TokenSpec &spec, const TokenSourceOptions &options) {
   if (!options.cache) {
@@ -28,7 +28,8 @@ std::shared_ptr<const TokenCacheFile> OpenCache(const std::shared_ptr<const Clie
         "TokenCacheOptions::owner must not be empty if the client has no holder-of-key identity");
   }
   const std::string owner = options.cache->owner.empty() ? "certificate:" + thumbprint : options.cache->owner;
-  // The token of a named user, too, may be bound to the identity: a client with another one cannot use it.
+  // The token of a named user may also be bound to the identity. A client with another identity cannot use such a
+  // token.
   const std::string properties = client.DescribeOptions() + " identity=" + thumbprint;
   return std::make_shared<const TokenCacheFile>(
       options.cache->path, CacheBinding{client.GetServiceUrl(), owner, spec, properties},

@@ -17,7 +17,7 @@ namespace SsoClient {
 
 namespace {
 
-/// Where a call that waits finds its outcome.
+/// The outcome of a call that waits.
 class AwaitedOutcome {
 public:
   void Set(const TokenOutcome &outcome) {
@@ -112,7 +112,7 @@ std::shared_ptr<const SamlToken> TokenSourceCore::ReadPublished() {
   const auto now = m_setup.time.GetSystemTime().time_since_epoch();
   std::shared_ptr<const SamlToken> token =
       m_published.Read(std::chrono::duration_cast<std::chrono::microseconds>(now).count());
-  // Not written each time, so that readers do not take the cache line from each other.
+  // Not written each time, so that readers on different processors do not slow each other down.
   if (token && !m_isAsked.load(std::memory_order_relaxed)) {
     m_isAsked.store(true, std::memory_order_relaxed);
   }
@@ -132,7 +132,7 @@ void TokenSourceCore::Join(const GetOptions &options, const CancelToken &otherTo
     number = ++m_calls;
     outcome = Ask(now, number, waiter, attempt);
   } catch (...) {
-    waiter->Withdraw(); // no memory: the waiter refers to itself until it is decided
+    waiter->Withdraw(); // no memory: the waiter owns itself until its end is decided
     throw;
   }
   if (outcome) {
@@ -158,9 +158,9 @@ void TokenSourceCore::Join(const GetOptions &options, const CancelToken &otherTo
   }
 }
 
-/// What the call with this number ends with; nothing if it waits. Called under the lock.
+/// The outcome of the call with this number; `boost::none` if the call waits. Called under the lock.
 /// @param attempt is set to the attempt that the caller must start without the lock
-/// @throws std::bad_alloc, then the call does not wait
+/// @throws std::bad_alloc; the call does not wait then
 boost::optional<TokenOutcome> TokenSourceCore::Ask(const Moment &now, std::uint64_t number,
                                                    const std::shared_ptr<TokenWaiter> &waiter,
                                                    std::shared_ptr<RefreshAttempt> &attempt) {
@@ -224,7 +224,7 @@ std::shared_ptr<RefreshAttempt> TokenSourceCore::CreateAttempt(const Moment &now
 void TokenSourceCore::OnAttemptEnded(std::uint64_t number, const TokenOutcome &outcome, bool isIssued) noexcept {
   const Moment now = ReadClocks(m_setup.time);
   RefreshState::Result result{outcome, false};
-  std::shared_ptr<RefreshAttempt> ended; // destroyed outside the lock, as the calls that waited
+  std::shared_ptr<RefreshAttempt> ended; // destroyed outside the lock, like the calls that waited
   Waiters waiters;
   {
     const std::lock_guard<Tarvel::ForkSafeMutex> lock(m_mutex);
@@ -364,12 +364,13 @@ void TokenSourceCore::UpdateTimer(const Moment &now) noexcept {
   }
 }
 
-/// In a child of the process that used the source last, forgets what is under way there. Called under the lock.
+/// In a child of the process that used the source last, forgets what is under way in that process. Called under the
+/// lock.
 void TokenSourceCore::AdoptInChild() noexcept {
   if (m_generation == Tarvel::GetForkGeneration()) {
     return;
   }
-  // Never destroyed, because that could end what the parent does, or call the host.
+  // Never destroyed, because a destructor could end what the parent does, or call code of the host.
   static std::atomic<OfParent *> allOfParents{nullptr};
   auto *const ofParent = new (std::nothrow) OfParent{std::move(m_waiters), std::move(m_attempt), allOfParents.load()};
   if (ofParent) {

@@ -36,11 +36,11 @@ struct TokenSourceSetup {
   std::function<double()> random;              ///< returns numbers between 0 and 1; called by one thread at a time
 };
 
-/// A number between 0 and 1, of a generator that no other process has.
+/// A random number between 0 and 1, different in each process.
 double DrawRandom();
 
-/// Joins the state of the source, the attempts, the calls that wait and the token that readers find without a lock. Its lock is
-/// never held while other code is called. Shared by its `TokenSource` and what is under way.
+/// Joins the state of the source, the attempts, the calls that wait and the token that readers find without a lock. Its
+/// lock is never held while code of the host runs. Shared by its `TokenSource` and by what is under way.
 class TokenSourceCore : public std::enable_shared_from_this<TokenSourceCore> {
 public:
   explicit TokenSourceCore(const TokenSourceSetup &setup);
@@ -48,16 +48,16 @@ public:
   TokenSourceCore &operator=(const TokenSourceCore &) = delete;
   ~TokenSourceCore() = default;
 
-  /// As `TokenSource::Get`.
+  /// Like `TokenSource::Get`.
   std::shared_ptr<const SamlToken> Get(const GetOptions &options);
 
-  /// As `TokenSource::GetAsync`; `otherToken` cancels, too.
+  /// Like `TokenSource::GetAsync`; `otherToken` cancels the call, too.
   void GetAsync(const GetOptions &options, const CancelToken &otherToken, TokenCallback callback);
 
-  /// As `TokenSource::GetFuture`.
+  /// Like `TokenSource::GetFuture`.
   std::future<std::shared_ptr<const SamlToken>> GetFuture(const GetOptions &options);
 
-  /// As `TokenSource::Invalidate`.
+  /// Like `TokenSource::Invalidate`.
   void Invalidate(const std::string &tokenId);
 
   /// Registers `function` until the returned object is destroyed.

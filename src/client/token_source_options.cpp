@@ -8,7 +8,7 @@ namespace SsoClient {
 
 namespace {
 
-// A token that is refreshed earlier would mean a request all the time.
+// Tokens that are refreshed earlier would cause too many requests.
 constexpr double EARLIEST_REFRESH = 0.1;
 constexpr double LATEST_REFRESH = 0.99;
 

@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// Checks what a token source is made of.
+/// `CheckTokenSource`, which checks the arguments of a token source.
 
 #pragma once
 

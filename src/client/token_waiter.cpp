@@ -95,7 +95,7 @@ bool TokenWaiter::Withdraw() noexcept {
   return true;
 }
 
-/// Whether the caller may end the call. Releases what could end it otherwise.
+/// Whether the caller may end the call. Releases the timer and the registrations, which could end the call, too.
 bool TokenWaiter::Decide() noexcept {
   if (m_isDecided.exchange(true)) {
     return false;

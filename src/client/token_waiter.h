@@ -20,7 +20,7 @@
 
 namespace SsoClient {
 
-/// Delivers exactly one outcome: the first of the source's, of a cancellation and of the deadline. Safe on any thread.
+/// Delivers exactly one outcome, from the source, a cancellation or the deadline: the first one. Safe on any thread.
 class TokenWaiter : public std::enable_shared_from_this<TokenWaiter> {
 public:
   /// @param executor where `callback` runs
@@ -29,17 +29,18 @@ public:
   TokenWaiter(const TokenWaiter &) = delete;
   TokenWaiter &operator=(const TokenWaiter &) = delete;
 
-  /// Lets the deadline and the tokens of a call end it; `onEnded` is then called after the delivery. Called at most once.
+  /// Lets the deadline and the cancel tokens of a call end it; `onEnded` is called after such an end. Called at most
+  /// once.
   /// @throws std::bad_alloc, Tarvel::InvalidStateException when the timer cannot be started
   void Arm(const GetOptions &options, const CancelToken &otherToken, const TimeSource &time,
            const std::function<void()> &onEnded);
 
-  /// Delivers `outcome` unless there has been one. The caller holds no lock.
-  /// @return whether this was the first
+  /// Delivers `outcome`, unless the call has ended. The caller holds no lock.
+  /// @return whether it was delivered
   bool Deliver(const TokenOutcome &outcome) noexcept;
 
-  /// Ends the call without an outcome, unless there has been one.
-  /// @return whether there has been none
+  /// Ends the call without an outcome, unless it has ended.
+  /// @return whether this ended the call
   bool Withdraw() noexcept;
 
 private:
@@ -54,8 +55,8 @@ private:
   bool Decide() noexcept;
 
   const Executor m_executor;
-  TokenCallback m_callback;         // for the thread that runs it, then null
-  std::function<void()> m_delivery; // made in time, because no memory must be needed later; null after the decision
+  TokenCallback m_callback;                // used by the thread that runs it; then null
+  std::function<void()> m_delivery;        // made early, so that a delivery needs no memory; null after the decision
   boost::optional<TokenOutcome> m_outcome; // set before the delivery
   std::atomic<bool> m_isDecided{false};
   Tarvel::ForkSafeMutex m_mutex; // guards all that follows
@@ -63,7 +64,7 @@ private:
   Registrations m_registrations;
 };
 
-/// What `options` and `otherToken` decide before anything is done.
+/// Checks `options` and `otherToken` before anything is done.
 /// @return null, or the exception of a call that is cancelled or late at its start
 std::exception_ptr FindEarlyEnd(const GetOptions &options, const CancelToken &otherToken, const TimeSource &time);
 

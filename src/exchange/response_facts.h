@@ -15,7 +15,7 @@ struct ResponseFacts {
   std::string reason;
   std::string contentType;
   std::size_t octets = 0;    ///< of the body as it was received
-  std::string retryAfter{};  ///< the value of that header; empty if there is none
+  std::string retryAfter{};  ///< the value of the header `Retry-After`; empty if there is none
   bool hasConnected = false; ///< whether a connection was made, so that the service may have received the request
 };
 

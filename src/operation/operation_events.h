@@ -30,10 +30,10 @@
 
 namespace SsoClient {
 
-/// Learns that the end of an operation has been reported.
+/// Is called after the end of an operation has been reported.
 class EventsEndListener {
 public:
-  /// No event of the operation comes after this.
+  /// No event of the operation follows this call.
   virtual void OnEventsEnded() noexcept = 0;
 
 protected:
@@ -47,7 +47,7 @@ protected:
 /// throws is logged, and so is a lack of memory for an event; neither changes the operation.
 ///
 /// One thread at a time uses the events of an operation, with one exception: `End` may be called on another thread while a
-/// step of the operation runs. Events that come after the end are dropped.
+/// step of the operation runs. Events after the end are dropped.
 class OperationEvents final : public FaultListener {
 public:
   /// The events of an operation that is not observed.
@@ -87,11 +87,12 @@ public:
   /// Sends `request`, and reports it and the response. With an observer, `request.facts` is set.
   Tarvel::Ref<Tarvel::Reader> Send(TransportSession &session, Request &request);
 
-  /// Reports that `request` is about to be sent, and sets its `facts`. For requests that nobody waits for.
+  /// Reports that `request` is about to be sent. With an observer, sets `request.facts` if it is null. For requests
+  /// that no thread waits for.
   void BeginExchange(Request &request) noexcept;
 
   /// Reports the response, or why there is none.
-  /// @param facts those of the request; null if there was no memory for them
+  /// @param facts `facts` of the request; null if there was no memory for them
   void EndExchange(const ResponseFacts *facts, const char *failure) noexcept;
 
   /// Calls `read` with a handler that does the same as `handler` and also reports faults.
@@ -131,7 +132,7 @@ private:
   int m_leg = 0;
   SecretMask m_mask;
   std::atomic<Use> m_use{Use::NONE};
-  std::exception_ptr m_failure; // with which the operation ended
+  std::exception_ptr m_failure; // the failure that ended the operation
   EventsEndListener *m_endListener = nullptr;
 };
 

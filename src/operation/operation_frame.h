@@ -14,15 +14,15 @@ struct FrameLines {
   const char *end;
 };
 
-/// Of the operations of `SecurityTokenService`.
+/// The lines for the operations of `SecurityTokenService`.
 constexpr FrameLines SERVICE_LINES{"opId=%1 START operation SecurityTokenServiceImpl::%2",
                                    "opId=%1 END operation SecurityTokenServiceImpl::%2"};
 
-/// Of the operations of `TokenClient`.
+/// The lines for the operations of `TokenClient`.
 constexpr FrameLines CLIENT_LINES{"opId=%1 START operation TokenClient::%2", "opId=%1 END operation TokenClient::%2"};
 
-/// Logs the start when it is created, and the end once: at the latest when it is destroyed, after a return or an exception.
-/// Both lines have the same new UUID.
+/// Logs the start when it is created, and the end once: in `LogEnd`, or when it is destroyed, after a return or an
+/// exception. Both lines have the same new UUID.
 class OperationFrame {
 public:
   explicit OperationFrame(const std::string &operationName, const FrameLines &lines = SERVICE_LINES);
@@ -30,7 +30,7 @@ public:
   OperationFrame &operator=(const OperationFrame &) = delete;
   ~OperationFrame() { LogEnd(); }
 
-  /// Logs the end, unless that was done before.
+  /// Logs the end, unless it has been logged.
   void LogEnd() noexcept;
 
   /// The UUID.

@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// `TokenSteps`, the steps of which the operations of a service consist, except sending.
+/// `TokenSteps`, the steps of the operations of a service or a client, except sending.
 
 #pragma once
 
@@ -21,8 +21,8 @@
 
 namespace SsoClient {
 
-/// Composes requests and reads responses: hides the secrets from the observer, writes to the log, and verifies the tokens
-/// that come back. Copies share the collaborators. Immutable, so any number of threads may use it.
+/// Composes requests and reads responses: hides the secrets from the observer, writes to the log, and verifies the
+/// returned tokens. Copies share the collaborators. Immutable, so any number of threads may use it.
 class TokenSteps {
 public:
   TokenSteps(std::shared_ptr<const RequestBuilder> requestBuilder,
@@ -42,13 +42,13 @@ public:
   std::shared_ptr<const SamlToken> ReadIssued(Tarvel::Reader &response, OperationEvents &events) const;
   std::shared_ptr<const SamlToken> ReadRenewed(Tarvel::Reader &response, OperationEvents &events) const;
 
-  /// Whether the service says that the token is valid.
+  /// Whether the service reports that the token is valid.
   bool ReadValidity(Tarvel::Reader &response, OperationEvents &events) const;
 
-  /// Writes what a negotiation asks for.
+  /// Logs the token that a negotiation requests.
   static void LogNegotiation(const TokenSpec &spec);
 
-  /// The next leg of `handler`, which is a part of the message with that number, from 1.
+  /// The next leg of `handler`. `number` is that of the message with the leg, from 1.
   /// @throws Tarvel::InvalidArgumentException when the handler returns null.
   static std::shared_ptr<std::vector<std::uint8_t>> AskForLeg(NegotiationHandler &handler,
                                                               const std::vector<std::uint8_t> &serviceLeg, int number,
@@ -57,7 +57,7 @@ public:
   /// Sets `spnego` to the response to a leg.
   void ReadLeg(Tarvel::Reader &response, SPNegoResponse &spnego, OperationEvents &events) const;
 
-  /// @throws CommunicationException when the response to a leg names no negotiation.
+  /// @throws CommunicationException when the response to a leg does not identify the negotiation.
   static void CheckLeg(const SPNegoResponse &spnego, OperationEvents &events);
 
   /// Passes the last leg of the service, if there is one, to the handler. The token has already been issued.
@@ -80,7 +80,7 @@ private:
   std::shared_ptr<const ReturnedTokens> m_returnedTokens;
 };
 
-/// Writes a line about the progress of an operation.
+/// Logs a line about the progress of an operation.
 void LogOperation(const char *message);
 
 } // namespace SsoClient

@@ -58,7 +58,7 @@ private:
 void TranslateResponse(const Tarvel::Exception *exception, const Tarvel::Ref<Tarvel::Http::ClientResponse> &response,
                        std::shared_ptr<const Tarvel::Exception> &error, Tarvel::Ref<Tarvel::Reader> &body);
 
-/// Sets `facts`, unless it is null, to those of `pending` and of its response, which is null if there is none.
+/// Sets `facts`, unless it is null, from `pending` and its response. `response` is null if there is none.
 void ReadFacts(const Tarvel::Ref<Tarvel::Http::PendingRequestItem> &pending,
                const Tarvel::Ref<Tarvel::Http::ClientResponse> &response, ResponseFacts *facts) noexcept;
 

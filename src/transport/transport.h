@@ -38,10 +38,12 @@ public:
   virtual void SendRequestAsync(const Request &request, const Completion &completion,
                                 Tarvel::Ref<Tarvel::System::ScheduledItem> &item) = 0;
 
-  /// The time that each request may take. `SendRequest` holds it; callers of `SendRequestAsync` call `TimeOut`.
+  /// The time that each request may take. `SendRequest` ends after it; callers of `SendRequestAsync` call `TimeOut`
+  /// after it.
   virtual std::chrono::microseconds GetTimeout() const noexcept { return std::chrono::minutes(4); }
 
-  /// Cancels a request of this session, whose completion gets the failure with which `SendRequest` ends after the time-out.
+  /// Cancels a request of this session. Its completion receives the failure that `SendRequest` throws after the
+  /// time-out.
   /// @param item what `SendRequestAsync` has returned
   virtual void TimeOut(Tarvel::System::ScheduledItem &item) noexcept { item.Cancel(); }
 

@@ -42,10 +42,10 @@ public:
 
   bool IsStarted() const noexcept { return !m_start; }
 
-  /// Starts the operation. As soon as it is started, the coroutine may continue on another thread and be destroyed, so the
-  /// caller shares this object until the function returns.
-  /// @return whether the coroutine stays suspended. It does not when the operation has ended within this call: a
-  ///         coroutine that waits in a loop would need more of the stack each time.
+  /// Starts the operation. As soon as the operation is started, the coroutine may continue on another thread and be
+  /// destroyed. So the caller keeps a reference to `state` until this function returns.
+  /// @return whether the coroutine stays suspended. It does not stay suspended when the operation has ended within this
+  ///         call. If it were resumed here, a coroutine that awaits in a loop would need more of the stack each time.
   static bool StartFor(std::coroutine_handle<> waiting, const std::shared_ptr<AwaitState> &state) {
     state->m_waiting = waiting;
     state->m_startingThread = std::this_thread::get_id();
@@ -81,7 +81,7 @@ private:
   CancelSource m_cancel;
   std::coroutine_handle<> m_waiting;
   std::atomic<std::thread::id> m_startingThread{std::thread::id()};
-  bool m_hasEndedInStart = false;    // used on that thread only
+  bool m_hasEndedInStart = false;    // used on the starting thread only
   std::atomic<bool> m_isOver{false}; // the coroutine continues, or has been destroyed
   boost::optional<Outcome<Value>> m_outcome;
 };
@@ -91,9 +91,10 @@ private:
 /// An operation that starts when a coroutine awaits it, once. `co_await` returns the result, or throws the operation's
 /// exception in its own class. Any type of coroutine can await it.
 ///
-/// The coroutine continues where the callback of the operation would run, or, if that is within the start of the operation,
-/// without having been suspended. Destroying the coroutine while it waits cancels the operation; the coroutine then does not
-/// continue. Destroy it only where it cannot continue at the same time, for example on the only thread of its executor.
+/// The coroutine continues where the callback of the operation would run. If the callback would run within the start of
+/// the operation, the coroutine is not suspended at all. Destroying the coroutine while it waits cancels the operation;
+/// the coroutine then does not continue. Destroy it only where it cannot continue at the same time, for example on the
+/// only thread of its executor.
 template <typename Value>
 class [[nodiscard]] Awaitable {
 public:
@@ -105,7 +106,7 @@ public:
   /// An operation that `start` starts.
   /// @throws std::bad_alloc
   explicit Awaitable(Start start) : m_state(std::make_shared<State>(std::move(start))) {}
-  /// The other one cannot be awaited any more.
+  /// The other object cannot be awaited any more.
   Awaitable(Awaitable &&) noexcept = default;
   Awaitable &operator=(Awaitable &&) = delete;
   /// Cancels the operation if a coroutine waits for it.
@@ -115,7 +116,7 @@ public:
     }
   }
 
-  /// Never: the operation starts when the coroutine is suspended.
+  /// Always false: the operation starts when the coroutine is suspended.
   bool await_ready() const noexcept { return false; }
 
   /// Starts the operation.

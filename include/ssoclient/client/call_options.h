@@ -18,18 +18,19 @@
 
 namespace SsoClient {
 
-/// When an operation is tried again. The default never does.
+/// When an operation is tried again. By default it never is.
 ///
-/// Only a request that the service cannot have acted upon is repeated: one for which no connection was made, and one that was
-/// answered with the status 503 and a header `Retry-After`, for which the policy waits as long as the service demands. An
-/// operation is not tried again when its deadline would pass during the wait. It then ends at once with the failure of the
-/// last attempt.
+/// Only a request that the service cannot have acted upon is repeated. Either no connection was made for it, or the
+/// service answered it with the status 503 and a header `Retry-After`. After such an answer, the policy waits as long
+/// as the service demands. An operation is not tried again when its deadline would pass during the wait. The operation
+/// then ends at once with the failure of the last attempt.
 ///
-/// Of a negotiation, only the first leg is tried again, with a new handler. A policy with less than one attempt or with a
-/// negative delay is refused with `Tarvel::InvalidArgumentException`.
+/// In a negotiation, only the first leg is tried again, with a new handler. A policy with less than one attempt or with
+/// a negative delay is refused with `Tarvel::InvalidArgumentException`.
 struct RetryPolicy {
-  int attempts = 1; ///< at most so many, the first included; at least 1
-  /// Before the second attempt. It doubles for each further one, and is shortened by up to a half at random.
+  int attempts = 1; ///< the maximum number of attempts, including the first; at least 1
+  /// The delay before the second attempt. It doubles before each further attempt, and up to the half of it is
+  /// subtracted at random.
   std::chrono::milliseconds firstDelay{200};
   std::chrono::milliseconds longestDelay{10'000}; ///< no delay is longer; a longer `Retry-After` ends the operation
 };

@@ -18,17 +18,17 @@ namespace SsoClient {
 /// What a source and its tokens share. Not for callers.
 class CancelState;
 
-/// Keeps a function registered; destroying it removes the function. It does not wait for a function that is already
-/// running. Can be moved, not copied.
+/// Keeps a function registered. Destroying this object removes the function, and does not wait if the function is
+/// already running. Can be moved, not copied.
 class SSOCLIENT_API CancelRegistration {
 public:
   /// Registers nothing.
   CancelRegistration() noexcept = default;
   /// Not for callers: `CancelToken::OnCancel` makes registrations.
   explicit CancelRegistration(std::shared_ptr<void> entry) noexcept : m_entry(std::move(entry)) {}
-  /// The other one then registers nothing.
+  /// The other object then registers nothing.
   CancelRegistration(CancelRegistration &&) noexcept = default;
-  /// Removes the function that was registered before. The other one then registers nothing.
+  /// Removes the function that was registered before. The other object then registers nothing.
   CancelRegistration &operator=(CancelRegistration &&) noexcept = default;
   ~CancelRegistration() = default;
 
@@ -43,7 +43,7 @@ public:
   CancelToken() noexcept = default;
 
 #ifdef __cpp_lib_jthread
-  /// Cancelled when `token` is requested to stop. Implicit, so that a `std::stop_token` can be given wherever a
+  /// Cancelled when `token` is requested to stop. Implicit, so that a `std::stop_token` can be passed wherever a
   /// `CancelToken` is expected. Only for programs in C++20 or later.
   /// @throws std::bad_alloc
   CancelToken(std::stop_token token);
@@ -61,10 +61,10 @@ public:
     return m_state != nullptr;
   }
 
-  /// Calls `function` once when the source cancels, on the thread that cancels; at once, in this call, when it has cancelled
-  /// already. Functions are called in the order in which they were registered, and no lock is held: `function` may cancel,
-  /// register functions and remove them. It must not block. What it throws is logged (logger "SsoClient", level 8). In a
-  /// child that `fork` makes, the functions of its parent are not called.
+  /// Calls `function` once when the source cancels, on the thread that cancels. If the source has cancelled already,
+  /// calls it at once, in this call. Functions are called in the order in which they were registered, and no lock is
+  /// held: `function` may cancel, register functions and remove them. It must not block. What it throws is logged
+  /// (logger "SsoClient", level 8). In a child that `fork` makes, the functions of its parent are not called.
   /// @return what keeps the function registered, and frees its memory
   /// @throws Tarvel::InvalidArgumentException when `function` is empty
   /// @throws std::bad_alloc
@@ -77,23 +77,23 @@ private:
   std::shared_ptr<CancelState> m_state; // null if it is never cancelled
 };
 
-/// Cancels the operations that were started with its tokens. Copies cancel the same tokens; a moved source remains one of
-/// them. Safe on any thread.
+/// Cancels the operations that were started with its tokens. Copies cancel the same tokens, and moving a source copies
+/// it. Safe on any thread.
 class SSOCLIENT_API CancelSource {
 public:
   /// @throws std::bad_alloc
   CancelSource();
   /// A source that cancels the same tokens.
   CancelSource(const CancelSource &) noexcept = default;
-  /// From now on this source cancels the tokens of the other one.
+  /// From now on this source cancels the tokens of the other source.
   CancelSource &operator=(const CancelSource &) noexcept = default;
   ~CancelSource() = default;
 
   /// A token that this source cancels.
   CancelToken GetToken() const noexcept { return CancelToken(m_state); }
 
-  /// Cancels all tokens of this source, once and for good. Does not wait: the operations end at once with `CancelledException`,
-  /// on their executors.
+  /// Cancels all tokens of this source. Further calls do nothing. Does not wait: the operations end at once with
+  /// `CancelledException`, on their executors.
   void Cancel() const noexcept;
 
   /// Whether `Cancel` has been called.
@@ -119,8 +119,8 @@ public:
   const CancelSource &GetSource() const noexcept { return m_source; }
 
 private:
-  /// Shares the bridge while it cancels. If another thread releases the bridge meanwhile, that thread need not wait for the
-  /// functions that run now, as the destructor of `std::stop_callback` otherwise would.
+  /// Shares the bridge while it cancels. If another thread releases the bridge while registered functions run, that
+  /// thread does not wait for them. Without the share, the destructor of `std::stop_callback` would wait.
   struct Canceller {
     void operator()() const noexcept {
       if (const std::shared_ptr<StopTokenBridge> shared = bridge.lock()) {

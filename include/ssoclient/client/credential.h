@@ -17,7 +17,7 @@ namespace SsoClient {
 
 /// A user's name and password.
 struct PasswordCredential {
-  std::string username;        ///< as the service knows it, for example "alice@corp.example"
+  std::string username;        ///< in the form that the service expects, for example "alice@corp.example"
   Tarvel::SecretText password; ///< overwritten when the last copy is destroyed
 };
 
@@ -31,12 +31,12 @@ struct TokenCredential {
 
 /// A GSS (SPNEGO) negotiation.
 struct NegotiationCredential {
-  /// Makes the handler of one negotiation; called once for each attempt, on the threads of the platform's pool, where it may
-  /// block. So are all functions of the handler. What it throws ends the operation.
+  /// Makes the handler of one negotiation; called once for each attempt. This function and all functions of the handler
+  /// are called on threads of the platform's pool, where they may block. What they throw ends the operation.
   std::function<std::shared_ptr<NegotiationHandler>()> makeHandler;
 };
 
-/// Any of them.
+/// Any of these credentials.
 using Credential = std::variant<PasswordCredential, CertificateCredential, TokenCredential, NegotiationCredential>;
 
 } // namespace SsoClient

@@ -8,7 +8,8 @@
 
 namespace SsoClient {
 
-/// The operation was cancelled: by its token, or because its client was destroyed. The service may have acted upon the request.
+/// The operation was cancelled: by its token, or because its client or its token source was destroyed. The service may
+/// have acted upon the request.
 class SSOCLIENT_API CancelledException : public CommunicationException {
   TARVEL_EXCEPTION_BODY(CancelledException, CommunicationException);
 };

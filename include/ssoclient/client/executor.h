@@ -12,7 +12,7 @@ namespace SsoClient {
 /// an event loop. It is called on threads of the library, so it must be safe on any thread and must not block.
 ///
 /// An executor refuses a function by throwing, or by destroying it without having run it. The function then runs on a
-/// thread of the library, because each operation must end with exactly one outcome; what an executor throws is logged.
+/// thread of the library, because each operation must end with exactly one outcome. What an executor throws is logged.
 ///
 /// An empty executor means the library's own threads (at most four), on which a callback must not block.
 using Executor = std::function<void(std::function<void()> function)>;

@@ -46,10 +46,10 @@ private:
   std::exception_ptr m_exception;
 };
 
-/// How an operation ended whose result is a token. The token is never null.
+/// How an operation that returns a token ended. The token is never null.
 using TokenOutcome = Outcome<std::shared_ptr<const SamlToken>>;
 
-/// How a validation ended: whether the token is valid, or why that is not known.
+/// How a validation ended: whether the token is valid, or why this is not known.
 using ValidityOutcome = Outcome<bool>;
 
 /// Called once with the outcome of an operation.

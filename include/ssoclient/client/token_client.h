@@ -36,39 +36,41 @@ class ClientCore;
 /// What a token source uses of a client. Not for callers.
 class ClientIssuer;
 
-/// A client of one token service whose operations have deadlines, can be cancelled, and hold no thread while they wait for the
-/// network. Their requests, results and failures are those of `SecurityTokenService`. Safe on any thread.
+/// A client of one token service. Its operations have deadlines, can be cancelled, and need no thread of their own
+/// while they wait for the network. Their requests, results and failures are those of `SecurityTokenService`. Safe on
+/// any thread.
 ///
 /// Each operation has four forms:
 /// - a call that waits (`Acquire`) returns the result, or throws the failure in its own class;
-/// - with a callback (`AcquireAsync`), the call returns at once, and the callback is called exactly once with the outcome, on
-///   the executor of the call or of the client, or, if there is none, on one of the library's own threads (at most four),
-///   where it must not block. It is never called within the call that starts the operation, unless no thread can be started.
-///   What a callback throws is logged (logger "SsoClient", level 8) and changes nothing else;
+/// - with a callback (`AcquireAsync`), the call returns at once, and the callback is called exactly once with the
+///   outcome, on the executor of the call or of the client. Without an executor, it runs on one of the library's own
+///   threads (at most four), where it must not block. It is never called within the call that starts the operation,
+///   unless no thread can be started. What a callback throws is logged (logger "SsoClient", level 8) and changes
+///   nothing else;
 /// - as a future (`AcquireFuture`), which becomes ready on a thread of the library. Destroying the future neither waits nor
 ///   cancels;
-/// - as an awaitable (`AcquireAwaitable`), for coroutines. It starts when it is awaited, and keeps what it needs of the
-///   client, so that the client may be destroyed (this cancels).
+/// - as an awaitable (`AcquireAwaitable`), for coroutines. The operation starts when it is awaited. The awaitable keeps
+///   what it needs of the client, so the client may be destroyed (this cancels).
 ///
-/// All operations fail as those of `SecurityTokenService` do: with the exceptions in `exceptions.h`, and with those of the
-/// platform that are named there. In addition, an operation fails with
+/// All operations fail like those of `SecurityTokenService`: with the exceptions in `exceptions.h`, and with those of
+/// the platform that are named there. In addition, an operation fails with
 /// - `CancelledException`, "The operation was cancelled", when its token is cancelled, and "The operation was cancelled because
 ///   its client was destroyed";
 /// - `DeadlineExceededException`, "The deadline passed before the operation ended";
 /// - `SsoException`, "The service returned an empty text instead of a token": a result is never null;
 /// - `Tarvel::InvalidArgumentException` for a null token, an empty `makeHandler`, and options that are not valid;
-/// - whatever a negotiation handler or the function that makes it throws.
+/// - what a negotiation handler throws, or the function that makes it.
 ///
-/// A cancelled or late operation ends at once, and closes its connection. What cannot be interrupted (looking up a name, a leg
-/// of a negotiation handler, the verification of a token) goes on without it on a thread of the library, and has no effect.
-/// If a token is cancelled, or a deadline has passed, when an operation starts, nothing is composed or sent.
+/// A cancelled or late operation ends at once, and closes its connection. Work that cannot be interrupted (looking up a
+/// name, a leg of a negotiation handler, the verification of a token) continues on a thread of the library, and has no
+/// effect. If a token is cancelled, or a deadline has passed, when an operation starts, nothing is composed or sent.
 ///
 /// A function that starts an operation throws only what keeps it from starting: `Tarvel::InvalidArgumentException` for a null
 /// callback, `Tarvel::InvalidStateException` when no thread can be started, and `std::bad_alloc`. The callback is not called
 /// then.
 ///
-/// In a child of `fork`, a client of the parent can be used. The operations of the parent go on only in the parent: in the
-/// child, their callbacks are not called, and their futures never become ready.
+/// In a child of `fork`, a client of the parent can be used. The operations of the parent continue only in the parent:
+/// in the child, their callbacks are not called, and their futures never become ready.
 class SSOCLIENT_API TokenClient {
 public:
   /// Copies the configuration, and takes its own reference to the SSL context. Nothing is sent.
@@ -80,18 +82,18 @@ public:
   explicit TokenClient(std::shared_ptr<ClientCore> core) noexcept;
   TokenClient(const TokenClient &) = delete;
   TokenClient &operator=(const TokenClient &) = delete;
-  /// Cancels the operations that are under way. Waits for nothing; each callback still runs, on its executor. May be called in
-  /// a callback.
+  /// Cancels the operations that are under way, and does not wait. Each callback still runs, on its executor. May be
+  /// called in a callback.
   ~TokenClient();
 
   /// A new token for `credential`, as `spec` describes it. Waits for the end of the operation.
   std::shared_ptr<const SamlToken> Acquire(const Credential &credential, const TokenSpec &spec,
                                            const CallOptions &options = {}) const;
-  /// A token like `token`, which is holder-of-key and renewable, for `lifetimeSec` seconds from now. Waits for the end of the
-  /// operation.
+  /// A token like `token` that is valid for `lifetimeSec` seconds from now. `token` must be holder-of-key and
+  /// renewable. Waits for the end of the operation.
   std::shared_ptr<const SamlToken> Renew(const std::shared_ptr<const SamlToken> &token, std::int64_t lifetimeSec,
                                          const CallOptions &options = {}) const;
-  /// Whether the service says that `token` is valid. Waits for the end of the operation.
+  /// Whether the service reports that `token` is valid. Waits for the end of the operation.
   bool Validate(const std::shared_ptr<const SamlToken> &token, const CallOptions &options = {}) const;
 
   /// `Acquire` with a callback.

@@ -45,7 +45,8 @@ public:
   void TimeOut(std::int64_t timeoutMicroseconds) noexcept override;
 
 private:
-  /// Many requests may wait for their responses, so the first buffer is small; most responses fit in it.
+  /// Many requests may wait for their responses, so the first buffer is small. If the first read does not complete the
+  /// response, further reads use a large one.
   static constexpr std::size_t FIRST_BUFFER_BYTES = 8 * 1024;
   static constexpr std::size_t BUFFER_BYTES = 16 * 1024; // the content of one TLS record
 
@@ -87,7 +88,7 @@ private:
   // Only one step at a time uses each of these members, so they need no lock. The message is kept until it is written.
   RequestData m_request;
   SecretText m_message;
-  // As secret as the response.
+  // Contains parts of the response, which may be secret.
   std::unique_ptr<char[]> m_buffer; // NOLINT(modernize-avoid-c-arrays): with its length beside it
   std::size_t m_bufferLength = 0;
   ResponseReader m_reader;

@@ -25,10 +25,10 @@ namespace {
 constexpr mode_t OWNER_ONLY = S_IRUSR | S_IWUSR;
 constexpr mode_t OTHERS = S_IRWXG | S_IRWXO;
 
-/// Without O_NONBLOCK, opening a FIFO would wait for its other end.
+/// Without O_NONBLOCK, opening a FIFO would wait until another process opens it, too.
 constexpr int SAFELY = O_NOFOLLOW | O_NONBLOCK | O_NOCTTY | O_CLOEXEC;
 
-/// How often the file may be replaced or removed by others while one call tries to lock it.
+/// How often other processes may replace or remove the file while one call tries to lock it.
 constexpr int MAX_ATTEMPTS = 100;
 
 [[noreturn]] void Fail(const char *action, const std::string &path, const std::string &reason) {
@@ -39,7 +39,7 @@ constexpr int MAX_ATTEMPTS = 100;
   Fail(action, path, std::system_category().message(error));
 }
 
-/// Calls a function of the system until no signal interrupts it.
+/// Calls a function of the system again as long as signals interrupt it.
 template <typename Call>
 auto Uninterrupted(const Call &call) {
   for (;;) {
@@ -138,7 +138,7 @@ std::string ReadContent(int descriptor, const std::string &path) {
   }
 }
 
-/// A new, empty file. Not open if there is one already.
+/// A new, empty file. The result is not open if the file exists already.
 OwnedDescriptor Create(const std::string &path) {
   OwnedDescriptor file = Open(path, O_RDWR | O_CREAT | O_EXCL, OWNER_ONLY);
   if (!file.IsOpen() && errno != EEXIST) {
@@ -185,8 +185,8 @@ bool HasPath(int descriptor, const std::string &path) {
   return ::lstat(path.c_str(), &current) == 0 && current.st_dev == opened.st_dev && current.st_ino == opened.st_ino;
 }
 
-/// The file with the new content, until it has the final path. Only the holder of the lock makes one, so a file with
-/// this name was left by a process that was killed.
+/// The file with the new content, until it has the final path. Only the holder of the lock makes one, so an existing
+/// file with this name is from a process that was killed.
 class Replacement {
 public:
   explicit Replacement(const std::string &finalPath)
@@ -212,7 +212,7 @@ public:
     }
   }
 
-  /// @return the descriptor of the file, which is locked from the moment at which it has the final path
+  /// @return the descriptor of the file, which is locked before it gets the final path
   int Publish() {
     if (!TryToLock(m_file.Get(), m_path)) {
       Fail("lock", m_path, "another process has locked it");
@@ -249,7 +249,8 @@ std::string FolderOf(const std::string &path) {
   return slash == std::string::npos ? "." : path.substr(0, slash + 1);
 }
 
-/// Makes new names in the folder permanent. Some file systems cannot, and then a loss of power may bring the old content back.
+/// Makes new names in the folder permanent. Some file systems cannot do this; after a loss of power, the old content
+/// may then be there again.
 void SynchroniseFolder(const std::string &folder) noexcept {
   const OwnedDescriptor opened(
       Uninterrupted([&] { return ::open(folder.c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC); }));
@@ -258,7 +259,7 @@ void SynchroniseFolder(const std::string &folder) noexcept {
   }
 }
 
-/// Closes the locked file. A child has a copy of the descriptor, so that closing it in the parent would not be enough.
+/// Unlocks and closes the locked file. Closing is not enough if a child of `fork` has a copy of the descriptor.
 void ReleaseLock(int descriptor, unsigned generation) noexcept {
   if (generation == GetForkGeneration()) {
     ::flock(descriptor, LOCK_UN);

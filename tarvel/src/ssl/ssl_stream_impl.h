@@ -34,8 +34,8 @@ public:
   void Close() noexcept override;
 
 private:
-  /// Many connections may wait for their servers, so they wait with a small buffer. If the server sends more, the next
-  /// read uses the large one, which holds the largest TLS record with its header (RFC 8446, section 5.2).
+  /// Many connections may wait for their servers, so they wait with a small buffer. If a read fills it, the next read
+  /// uses the large one, which is long enough for the largest TLS record with its header (RFC 8446, section 5.2).
   static constexpr std::size_t WAITING_INPUT_BYTES = 4096;
   static constexpr std::size_t INPUT_BYTES = 5 + TlsConnection::RECORD_BYTES + 256;
 

@@ -133,7 +133,8 @@ bool SSLStreamImpl::StepHandshake(Completions &done) {
   if (progress != Progress::DONE) {
     return WaitsForBytes(progress, done);
   }
-  // The handler probably writes. The next step runs after it, and sends the handshake's last message together with that.
+  // The handler probably writes. The next step runs after the handler, and sends the handshake's last message together
+  // with what it writes.
   PostPump();
   m_wasResumed = m_tls.WasResumed();
   m_stage = Stage::ESTABLISHED;

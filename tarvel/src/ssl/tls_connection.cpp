@@ -40,7 +40,7 @@ std::string DescribeRefusal(X509_STORE_CTX *verification) {
          DescribeSubject(X509_STORE_CTX_get_current_cert(verification)) + "\")";
 }
 
-/// Gives `buffer` new memory, as little as possible, if it is empty and has had bytes before.
+/// If `buffer` is empty, frees the memory that it has from earlier bytes.
 void ReleaseIfEmpty(BIO *buffer) noexcept {
   BUF_MEM *memory = nullptr;
   BIO_get_mem_ptr(buffer, &memory);
@@ -315,7 +315,7 @@ void TlsConnection::DropOutput() noexcept {
 }
 
 void TlsConnection::ReleaseEmptyBuffers() noexcept {
-  SSL_free_buffers(m_connection.get()); // SSL_MODE_RELEASE_BUFFERS would release only the one for received records
+  SSL_free_buffers(m_connection.get()); // SSL_MODE_RELEASE_BUFFERS would release only the buffer for received records
   ReleaseIfEmpty(m_received);
   ReleaseIfEmpty(m_toSend);
 }

@@ -83,7 +83,7 @@ public:
 
   void DropOutput() noexcept;
 
-  /// Frees the buffers that are empty: of this connection, and of OpenSSL for its records. Called before a wait for the
+  /// Frees the empty buffers of this connection, and those of OpenSSL for its records. Called before a wait for the
   /// server, which may be long.
   void ReleaseEmptyBuffers() noexcept;
 

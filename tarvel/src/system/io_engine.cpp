@@ -36,8 +36,9 @@ Descriptors &GetDescriptors() {
   return *descriptors;
 }
 
-/// The context of one I/O thread. If two threads shared a context, Asio would wake the other one at each event, to wait
-/// for the next event while the first handles this one. For a single request that takes longer than the work.
+/// The context of one I/O thread. If two threads shared a context, Asio would wake the second one at each event, so
+/// that it waits for the next event while the first thread handles this one. For a single request, waking it takes
+/// longer than handling the event.
 struct ThreadContext {
   /// @throws boost::system::system_error when no descriptor is left.
   ThreadContext() {
@@ -136,7 +137,7 @@ private:
   }
 
   std::array<ThreadContext, IO_THREADS> m_contexts;
-  std::size_t m_started = 0; // so many contexts, the first ones, have a thread
+  std::size_t m_started = 0; // the first `m_started` contexts have a thread
   IoEngine *m_ofParent =
       nullptr; // never used; keeps the objects of the parent's operations reachable, so that no leak is reported
 };

@@ -15,12 +15,12 @@ namespace Tarvel::System {
 /// Two, so that one long handshake does not delay everything else.
 constexpr std::size_t IO_THREADS = 2;
 
-/// The context of an I/O thread: on an I/O thread its own, on other threads the one with the fewest sockets. An object
-/// with several sockets and timers calls this once, so that one thread runs all of its handlers. The threads start with
-/// the first call and run until the process ends. All pending operations share them, so a handler must never block; an
-/// exception that it throws is logged and ignored. A child process made by `fork` has its own contexts and threads,
-/// which start with its own first call. Use a context, its sockets and its timers only within a `Computation`; the I/O
-/// threads are in one already.
+/// The context of an I/O thread. On an I/O thread, this is its own; on other threads, the one with the fewest sockets.
+/// An object with several sockets and timers calls this once, so that one thread runs all of its handlers. The threads
+/// start with the first call and run until the process ends. All pending operations share them, so a handler must never
+/// block; an exception that it throws is logged and ignored. A child process made by `fork` has its own contexts and
+/// threads, which start with its own first call. Use a context, its sockets and its timers only within a `Computation`;
+/// the I/O threads are in one already.
 /// @throws InvalidStateException when the first thread cannot be started, or the process has no descriptor left.
 boost::asio::io_context &GetIoContext();
 
@@ -28,7 +28,7 @@ boost::asio::io_context &GetIoContext();
 /// @throws what `GetIoContext` throws
 boost::asio::io_context &GetIoContextOf(std::size_t thread);
 
-/// The context of one socket, which counts as one of its sockets.
+/// The context that a socket uses. While this object exists, the context counts that socket.
 class SocketContext {
 public:
   /// @throws what `GetIoContext` throws

@@ -224,7 +224,7 @@ public:
         StartThreadFor(*item, state);
       }
     }
-    state->changed.notify_one(); // after the lock is released: otherwise the woken thread would wait for it at once
+    state->changed.notify_one(); // after the unlock: otherwise the woken thread would wait for the lock at once
     return item;
   }
 

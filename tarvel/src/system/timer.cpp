@@ -21,7 +21,7 @@ namespace {
 
 using TimePoint = std::chrono::steady_clock::time_point;
 
-/// How many functions run one after the other before other work of the I/O threads has its turn.
+/// How many functions run one after the other before the I/O thread does other work.
 constexpr std::size_t BATCH = 16;
 
 class TimerQueue;
@@ -50,8 +50,8 @@ private:
   std::atomic<Stage> m_stage{Stage::WAITING};
 };
 
-/// All timers of a process, with one alarm for the earliest. So a timer that is cancelled before its time, as nearly all
-/// are, costs neither a system call nor a switch of threads.
+/// All timers of a process, with one alarm for the earliest. So a timer that is cancelled before its time, like nearly
+/// all timers, costs neither a system call nor a switch of threads.
 class TimerQueue {
 public:
   /// @param ofParent never used; it keeps the timers of the parent process reachable, so that no leak is reported.
@@ -143,7 +143,7 @@ Ref<Timer> TimerQueue::Remove(Timer &timer) noexcept {
 
 /// Replaces an earlier alarm. Called under the mutex.
 void TimerQueue::Arm(TimePoint time) {
-  m_isArmed = false; // if memory runs out below, `OnAlarm` is called for the alarm that was replaced, and tries again
+  m_isArmed = false; // if memory runs out below, `OnAlarm` of the replaced alarm tries again
   m_alarm.expires_at(time);
   m_alarm.async_wait([this](const boost::system::error_code &error) { OnAlarm(static_cast<bool>(error)); });
   m_armedFor = time;

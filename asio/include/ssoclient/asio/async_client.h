@@ -6,12 +6,12 @@
 /// `boost::asio::use_future` or `boost::asio::use_awaitable`. A handler gets a `std::exception_ptr`, null for a success, and the
 /// result.
 ///
-/// The handler is called once, never within the function that starts the operation, by the executor that is associated with
-/// it, which has work until then; without one, on a thread of the library (at most four), where it must not block. The
-/// handler's allocator allocates what its executor queues. What the start of the operation throws reaches the handler as
-/// well. If the execution context is destroyed first, the handler is destroyed and not called, as Asio does with all its
-/// handlers, and the operation is cancelled.
-/// In a child of `fork`, no handler of the parent is called; `notify_fork` destroys them.
+/// The handler is called once, never within the function that starts the operation. Its associated executor calls it,
+/// and has work until then. A handler without an executor is called on a thread of the library (at most four), where it
+/// must not block. The handler's allocator allocates what its executor queues. What the start of the operation throws
+/// is passed to the handler, too. If the execution context is destroyed first, the handler is destroyed and not called,
+/// like all handlers of Asio, and the operation is cancelled. In a child of `fork`, no handler of the parent is called;
+/// `notify_fork` destroys them.
 ///
 /// The operation is cancelled by `cancelToken` of the options, and, where Asio has cancellation slots (from Boost 1.77 on), by
 /// the handler's slot, with any type of cancellation.
@@ -28,8 +28,8 @@
 /// The client for programs that use Boost.Asio.
 namespace SsoClient::Asio {
 
-/// Acquires a token, as `TokenClient::AcquireAsync` does. The handler's signature is
-/// `void(std::exception_ptr, std::shared_ptr<const SamlToken>)`; the token is null when there is an exception.
+/// Acquires a token, like `TokenClient::AcquireAsync`. The handler's signature is `void(std::exception_ptr,
+/// std::shared_ptr<const SamlToken>)`; the token is null when there is an exception.
 /// @param client must exist until the operation starts, which `use_awaitable` and other lazy tokens do later
 /// @param options its executor is not used
 /// @return what the completion token returns, for example a `std::future<std::shared_ptr<const SamlToken>>`
@@ -45,7 +45,7 @@ auto AsyncAcquire(const TokenClient &client, Credential credential, TokenSpec sp
       });
 }
 
-/// Renews a token, as `TokenClient::RenewAsync` does. Parameters, signature and result as for `AsyncAcquire`.
+/// Renews a token, like `TokenClient::RenewAsync`. Parameters, signature and result as for `AsyncAcquire`.
 /// @throws std::bad_alloc
 template <typename CompletionToken>
 auto AsyncRenew(const TokenClient &client, std::shared_ptr<const SamlToken> renewed, std::int64_t lifetimeSec,
@@ -57,7 +57,7 @@ auto AsyncRenew(const TokenClient &client, std::shared_ptr<const SamlToken> rene
       });
 }
 
-/// Asks the service whether a token is valid, as `TokenClient::ValidateAsync` does. The handler's signature is
+/// Asks the service whether a token is valid, like `TokenClient::ValidateAsync`. The handler's signature is
 /// `void(std::exception_ptr, bool)`; parameters and result as for `AsyncAcquire`.
 /// @throws std::bad_alloc
 template <typename CompletionToken>

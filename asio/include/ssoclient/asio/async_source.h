@@ -1,7 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// `AsyncGet`: the token of a `TokenSource` for programs that use Boost.Asio. All that `async_client.h` says about handlers holds
-/// here, too.
+/// `AsyncGet`: the token of a `TokenSource` for programs that use Boost.Asio. What `async_client.h` states about
+/// handlers is true here, too.
 
 #pragma once
 
@@ -13,8 +13,8 @@
 
 namespace SsoClient::Asio {
 
-/// Gets a fresh token, as `TokenSource::GetAsync` does. The handler's signature is
-/// `void(std::exception_ptr, std::shared_ptr<const SamlToken>)`; the token is null when there is an exception.
+/// Gets a fresh token, like `TokenSource::GetAsync`. The handler's signature is `void(std::exception_ptr,
+/// std::shared_ptr<const SamlToken>)`; the token is null when there is an exception.
 /// @param source must exist until the operation starts, which `use_awaitable` and other lazy tokens do later
 /// @param options its executor is not used
 /// @return what the completion token returns, for example a `std::future<std::shared_ptr<const SamlToken>>`

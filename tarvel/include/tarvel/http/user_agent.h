@@ -69,13 +69,13 @@ protected:
 /// A request that has been started.
 class TARVEL_API PendingRequestItem : public System::ScheduledItem {
 public:
-  /// Whether the server may have received a part of the request: false means that none was sent, because no connection
-  /// was made (over TLS: because the handshake failed) or the request was cancelled before. Final once the completion
-  /// function is called. In a child process, what it was when the process forked.
+  /// Whether the server may have received a part of the request. False means that nothing was sent: no connection was
+  /// made (over TLS: or the handshake failed), or the request was cancelled before that. The value is final when the
+  /// completion function is called. In a child process, it is the value at the time of the fork.
   virtual bool HasConnected() const noexcept = 0;
 
-  /// Cancels the request. Its completion function gets the exception that `WaitForRequest` throws after a time-out of
-  /// `timeoutMicroseconds`.
+  /// Cancels the request. Its completion function receives the exception that `WaitForRequest` throws after a time-out
+  /// of `timeoutMicroseconds`.
   virtual void TimeOut(std::int64_t timeoutMicroseconds) noexcept = 0;
 
 protected:

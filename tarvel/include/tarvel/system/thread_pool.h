@@ -48,7 +48,7 @@ constexpr std::size_t DEFAULT_THREAD_CEILING = 256;
 /// The process's pool, made on first use (no thread before the first item); it lives until the process ends.
 TARVEL_API Ref<ThreadPool> GetThreadPool();
 
-/// How many threads the pool for computations has at most.
+/// The maximum number of threads of the pool for computations.
 constexpr std::size_t COMPUTE_THREAD_CEILING = 4;
 
 /// The process's pool for short computations, such as composing and verifying messages: its items must not block, nor wait

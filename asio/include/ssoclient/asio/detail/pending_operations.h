@@ -34,8 +34,9 @@ protected:
   ~PendingOperation() = default;
 };
 
-/// The pending operations of one execution context, shared by both. The thread that ends an operation must not use a context
-/// that has been destroyed. So the end of the operation and the end of the context compete for the operation in this list.
+/// The pending operations of one execution context. The context and the operations share this list. The thread that
+/// ends an operation must not use a context that has been destroyed. So the end of the operation and the end of the
+/// context compete for the operation in this list.
 class PendingOperations {
 public:
   using Operations = std::list<std::shared_ptr<PendingOperation>>;
@@ -73,11 +74,12 @@ public:
 
 private:
   Tarvel::ForkSafeMutex m_mutex;
-  bool m_isClosed = false; // guarded by m_mutex, as the list is
+  bool m_isClosed = false; // guarded by m_mutex, like the list
   Operations m_operations;
 };
 
-/// Ends the pending operations of an execution context together with it. Asio prescribes the names in lower case.
+/// Abandons the pending operations of an execution context when the context is destroyed. Asio prescribes the names in
+/// lower case.
 class PendingOperationsService final : public boost::asio::execution_context::service {
 public:
   using key_type = PendingOperationsService; // NOLINT(readability-identifier-naming)
@@ -103,8 +105,8 @@ private:
   const std::shared_ptr<PendingOperations> m_operations = std::make_shared<PendingOperations>();
 };
 
-/// The pending operations of the context of `executor`; if it has none, a list of its own. Asio's system context counts as
-/// none: it starts threads when it is first used.
+/// The pending operations of the context of `executor`; a separate list if the executor has no context. Asio's system
+/// context is not used, because it starts threads when it is first used.
 template <typename Executor>
 std::shared_ptr<PendingOperations> PendingOperationsOf(const Executor &executor) {
   using boost::asio::execution_context;

@@ -31,7 +31,7 @@
 
 namespace SsoClient::Asio::Detail {
 
-/// A handler and what it is called with. Asio prescribes the names in lower case.
+/// A handler and the outcome that it is called with. Asio prescribes the names in lower case.
 template <typename Value, typename Handler>
 class BoundHandler {
 public:
@@ -56,8 +56,8 @@ private:
   Outcome<Value> m_outcome;
 };
 
-/// An operation and the handler that waits for it. Its memory is not from the handler's allocator: the library may share it
-/// until after the call of the handler, when the allocator may be gone.
+/// An operation and the handler that waits for it. The memory of this object is not from the handler's allocator: the
+/// library may share the object until after the call of the handler, when the allocator may have been destroyed.
 template <typename Value, typename Handler>
 class HandledOperation final : public PendingOperation {
 public:
@@ -95,7 +95,7 @@ public:
     });
   }
 
-  /// The same. A handler without an executor is called at once.
+  /// Like `Post`, but a handler without an executor is called in this call.
   void Complete(const Outcome<Value> &outcome) {
     if constexpr (std::is_same_v<Executor, boost::asio::system_executor>) {
       boost::optional<Bound> bound;
