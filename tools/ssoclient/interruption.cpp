@@ -36,7 +36,7 @@ constexpr int NOTHING = 0;
 constexpr int TOO_LATE = -1;
 std::atomic<int> g_cause{NOTHING};
 
-std::mutex g_writing; // locked while a file is not complete, and never unlocked after the command has ended
+std::mutex g_writing; // locked while a file is not complete, and for the rest of the process after the command
 std::mutex g_naming;  // protects the path
 std::string g_unfinishedPath;
 
@@ -80,7 +80,7 @@ int AwaitSignal(const sigset_t &set, const boost::optional<Clock::time_point> &t
   }
 }
 
-/// Waits at most so long, and returns whether a signal that ends the process has arrived.
+/// Waits for at most `time`, and returns whether a signal that ends the process has arrived.
 bool IsInterruptedWithin(microseconds time) noexcept {
   const int signal = AwaitSignal(g_awaited, Clock::now() + time);
   return signal != 0 && signal != EndOfCommand();
