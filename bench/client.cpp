@@ -1,9 +1,9 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// Measures what the client for deadlines and cancellation is for: many acquisitions under way at once, their threads
-/// and memory, and their throughput compared with libcurl's multi interface and one check of each token; how soon a
-/// cancelled or late acquisition ends; and what a call for a token that is still fresh costs. The service is a process
-/// of its own. bench/service.cpp measures a single acquisition.
+/// Measures `TokenClient` and `TokenSource`: the threads and memory of many acquisitions under way at once; their
+/// throughput, compared with libcurl's multi interface and one check of each token; how soon a cancelled or late
+/// acquisition ends; and how long a call takes that returns a fresh token. The service is a process of its own.
+/// bench/service.cpp measures a single acquisition.
 
 #include "crowd.h"
 #include "curl_crowd.h"
@@ -41,7 +41,7 @@ using Kind = HeldServer::Kind;
 constexpr std::chrono::milliseconds SERVICE_TIME{100};
 constexpr unsigned long SPARE_DESCRIPTORS = 100;
 
-/// So many acquisitions at once, in so many rounds.
+/// How many acquisitions are started at once, and in how many rounds.
 struct CrowdSize {
   std::size_t operations;
   int rounds;
@@ -57,7 +57,7 @@ struct Settings {
   std::string json;
 };
 
-/// What acquisitions cost while all wait for the service.
+/// The memory and threads of acquisitions while all of them wait for the service.
 struct UnderWay {
   std::size_t operations = 0;
   double kilobytesEach = 0;
@@ -191,7 +191,7 @@ void Print(const char *what, const GetTimes &times) {
               times.atomicSharedPtr, times.mutexSharedPtr, times.ratio);
 }
 
-// Memory first, while the process has not kept any from other measurements.
+// Memory is measured first, before the process keeps memory of other measurements.
 Figures MeasureAll(const Settings &settings) {
   Figures figures;
   figures.http = MeasureUnderWay(Kind::HTTP, settings.underWay);

@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// `Crowd`, many acquisitions at once through one `TokenClient`, and the service that answers them.
+/// `Crowd`, many acquisitions at once through one `TokenClient`, and what the service answers.
 
 #pragma once
 
@@ -20,7 +20,7 @@
 
 namespace Bench {
 
-/// The service's answer, the token in it, and who may sign it.
+/// The service's answer, the token in it, and the certificates that may sign it.
 const std::string &GetIssueResponse();
 const std::string &GetIssuedTokenXml();
 const Tarvel::Crypto::CertificateList &GetTrustedCertificates();
@@ -28,11 +28,11 @@ extern const std::string CROWD_USER;
 extern const std::string CROWD_PASSWORD;
 SsoClient::TokenSpec GetCrowdSpec();
 
-/// A client of a server. The TLS context is the client's own.
+/// A client of a server. It has its own TLS context.
 std::shared_ptr<const SsoClient::TokenClient> ConnectTo(const Testing::HeldServer &server);
 
-/// Starts acquisitions and counts their outcomes. Keeps little memory for each, so that what the process grows by is
-/// the library's.
+/// Starts acquisitions and counts their outcomes. Keeps little memory for each, so that the growth of the process is
+/// the library's memory.
 class Crowd {
 public:
   explicit Crowd(std::shared_ptr<const SsoClient::TokenClient> client) : m_client(std::move(client)) {}
@@ -41,7 +41,7 @@ public:
 
   void Start(std::size_t count, const SsoClient::CallOptions &options = {});
 
-  /// Waits until all that were started have ended, each with the right token.
+  /// Waits until all started acquisitions have ended, each with the right token.
   /// @throws std::runtime_error with the first other outcome, or after two minutes
   void WaitForTokens();
 
@@ -55,7 +55,7 @@ private:
   std::string m_wrong;       // guarded by the mutex
 };
 
-/// Waits, looking each millisecond, until the server has received `count` requests in total.
+/// Waits until the server has received `count` requests in total; checks this each millisecond.
 /// @throws std::runtime_error after two minutes
 void WaitForRequests(const Testing::HeldServer &server, int count);
 

@@ -27,7 +27,7 @@ public:
   /// The body of the response, valid until the next call. @throws std::runtime_error
   const std::string &Post();
 
-  /// The prepared request, for a crowd of them in one multi interface.
+  /// The prepared request, for use in a multi interface.
   CURL *GetHandle() const noexcept { return m_handle.get(); }
   const std::string &GetResponse() const noexcept { return m_response; }
   void ClearResponse() noexcept { m_response.clear(); }

@@ -38,7 +38,7 @@ CurlCrowd::CurlCrowd(const std::string &url, const std::string &authorityFile, c
   for (std::size_t i = 0; i < requests; ++i) {
     m_clients.push_back(std::make_unique<CurlClient>(url, authorityFile, soapAction, body));
     curl_easy_setopt(m_clients.back()->GetHandle(), CURLOPT_PRIVATE, m_clients.back().get());
-    curl_easy_setopt(m_clients.back()->GetHandle(), CURLOPT_DNS_CACHE_TIMEOUT, -1L); // kept for good
+    curl_easy_setopt(m_clients.back()->GetHandle(), CURLOPT_DNS_CACHE_TIMEOUT, -1L); // never removed
   }
   m_multi = curl_multi_init();
   Require(m_multi && m_poll >= 0, "it does not start");
@@ -46,7 +46,7 @@ CurlCrowd::CurlCrowd(const std::string &url, const std::string &authorityFile, c
   curl_multi_setopt(m_multi, CURLMOPT_SOCKETDATA, this);
   curl_multi_setopt(m_multi, CURLMOPT_TIMERFUNCTION, &CurlCrowd::OnTimer);
   curl_multi_setopt(m_multi, CURLMOPT_TIMERDATA, this);
-  Post(1, [](const std::string &) {}); // afterwards the name and the authorities are in the caches
+  Post(1, [](const std::string &) {}); // afterwards the caches have the name and the authorities
 }
 
 CurlCrowd::~CurlCrowd() {

@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// libcurl's multi interface, the peer with which many acquisitions at once are compared.
+/// Many requests at once through libcurl's multi interface. The benchmarks compare many acquisitions with them.
 
 #pragma once
 
@@ -15,7 +15,7 @@
 namespace Bench {
 
 /// Many requests at once on the calling thread, each over a new connection, with the settings of `CurlClient`. It uses
-/// the multi interface as an experienced host would: `curl_multi_socket_action` with epoll, prepared handles, and one
+/// the multi interface like an experienced developer: `curl_multi_socket_action` with epoll, prepared handles, and one
 /// cache of names and authorities for all.
 class CurlCrowd {
 public:

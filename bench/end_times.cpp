@@ -19,7 +19,7 @@ namespace {
 
 using Clock = std::chrono::steady_clock;
 
-/// When an acquisition has ended. It must end with an `Expected`.
+/// When an acquisition has ended. It must end with an exception of the class `Expected`.
 template <typename Expected>
 class End {
 public:

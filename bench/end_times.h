@@ -16,13 +16,12 @@ struct EndTimes {
   double worst = 0;
 };
 
-/// Cancels `samples` acquisitions one after the other, each among `underWay` that wait for the service.
-/// @param server holds its answers
+/// Cancels `samples` acquisitions one after the other. At each cancel, `underWay` acquisitions wait for the service.
+/// @param server does not answer (`Hold`)
 EndTimes MeasureCancel(const Testing::HeldServer &server, std::size_t underWay, std::size_t samples);
 
-/// Starts `count` acquisitions whose deadlines pass one after the other, each a millisecond after the one before, while
-/// all wait for the service.
-/// @param server holds its answers
+/// Starts `count` acquisitions, which all wait for the service. Then their deadlines pass, one each millisecond.
+/// @param server does not answer (`Hold`)
 EndTimes MeasureDeadline(const Testing::HeldServer &server, std::size_t count);
 
 } // namespace Bench

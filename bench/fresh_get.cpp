@@ -31,7 +31,7 @@ struct Period {
   Clock::time_point end;
 };
 
-/// Nanoseconds for one call of `get`, which each thread calls `calls` times.
+/// Nanoseconds for one call of `get`. Each thread calls it `calls` times.
 template <typename Get>
 double Measure(int threads, int calls, const Get &get) {
   std::barrier start(threads);

@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// Compares `TokenSource::Get` with a fresh token with what a program could write instead.
+/// Compares `TokenSource::Get`, while the token is fresh, with two variables that a program could use instead.
 
 #pragma once
 
@@ -12,16 +12,16 @@ class TokenSource;
 
 namespace Bench {
 
-/// Nanoseconds of wall time for one call on each of the threads: the time from start to end, divided by the calls of one
+/// Nanoseconds of wall time: from the start of the first thread to the end of the last one, divided by the calls of one
 /// thread.
 struct GetTimes {
   double source = 0;          ///< `TokenSource::Get`
   double atomicSharedPtr = 0; ///< a copy of a `std::atomic<std::shared_ptr>`
   double mutexSharedPtr = 0;  ///< a copy of a `std::shared_ptr` under a mutex
-  double ratio = 0;           ///< median of the rounds' ratios of the first to the second
+  double ratio = 0;           ///< of `source` to `atomicSharedPtr`; median of the rounds
 };
 
-/// Measures the three alternately, some rounds, and returns the medians.
+/// Measures the three alternately in `rounds` rounds, and returns the medians.
 /// @param source has a fresh token
 GetTimes MeasureGet(const SsoClient::TokenSource &source, int threads, int rounds, int calls);
 

@@ -9,7 +9,8 @@
 
 namespace Bench {
 
-/// The median of at least one value; of an even number of values, the greater one of the two in the middle.
+/// The median of the values, of which there must be at least one. For an even number of values, it is the greater one
+/// of the two in the middle.
 inline double MedianOf(std::vector<double> values) {
   std::sort(values.begin(), values.end());
   return values[values.size() / 2];

@@ -1,7 +1,7 @@
 # SPDX-License-Identifier: Apache-2.0
 # Fails unless the figures of the benchmark "client" in the JSON of FILE, which scripts/bench has written, are within their
-# limits: cmake -D FILE=… -P. Memory and threads do not depend on the machine's speed and have their real limits. Times do:
-# in a short run on a busy machine the limits of times only show that nothing is wrong by a large factor.
+# limits: cmake -D FILE=… -P. Memory and threads do not depend on the machine's speed, so they have their real limits. Times depend
+# on it: in a short run on a busy machine, their limits only show that nothing is wrong by a large factor.
 file(READ "${FILE}" figures)
 
 # limit(BOUND PATH…): the figure at the path must be at most BOUND.

@@ -3,9 +3,9 @@
 /// Compares acquiring a token by password over loopback TLS with the work that cannot be avoided: the exchange of the
 /// same bytes, by libcurl, and one check of the token. The limit is the sum of the two; both in one loop are measured
 /// as well. Each exchange has a new connection, with a full handshake or a resumed one. The times are wall times, which
-/// a caller waits for; the server runs in this process, and all figures include its work. The same is measured through
-/// `TokenClient`, with its call that waits. The last figures are the tokens that one service acquires in a second for
-/// several threads.
+/// a caller waits for; the server runs in this process, and all figures include its work. The same is measured for the
+/// call of `TokenClient` that waits. The last figures are the tokens that one service acquires in a second for several
+/// threads.
 
 #include "canned_server.h"
 #include "curl_client.h"
@@ -85,7 +85,7 @@ private:
   const std::shared_ptr<const SsoClient::SecurityTokenService> m_service;
 };
 
-/// The same through the client for deadlines and cancellation.
+/// The same with a `TokenClient`.
 class Client {
 public:
   explicit Client(const std::string &url) : m_client(ConfigFor(url, *m_context)) {}

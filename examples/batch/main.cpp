@@ -31,7 +31,7 @@ namespace {
 enum ExitCode { DONE = 0, FAILED = 1, USAGE = 2 };
 
 /// Reads a line of standard input, octet by octet. `std::getline` would leave copies of the password in memory: in the
-/// buffer of the stream, and wherever the string was before it grew.
+/// buffer of the stream, and in the memory that the string used before it grew.
 Tarvel::SecretText ReadPassword() {
   Tarvel::SecretText password;
   char octet = 0;
@@ -61,14 +61,14 @@ struct Summary {
   std::map<std::string, int> failures; // how often, by text
 };
 
-/// Starts one job again and again. Each outcome starts the next operation, so that always the same number is under way.
+/// Starts one job again and again. Each outcome starts the next operation, so that the same number is always under way.
 /// Callbacks keep the batch alive, and run on several threads.
 class Batch : public std::enable_shared_from_this<Batch> {
 public:
   Batch(const SsoClient::SecurityTokenServiceConfig &config, Job job, int count)
       : m_client(config), m_job(std::move(job)), m_left(count), m_open(count) {}
 
-  /// Starts up to `atOnce` operations, and returns when all of the batch have ended.
+  /// Starts up to `atOnce` operations, and returns when all operations of the batch have ended.
   Summary Run(int atOnce) {
     for (int i = 0; i < atOnce; ++i) {
       StartNext();

@@ -19,7 +19,7 @@ SsoClient::VerifyOptions OptionsOfFiles() {
   return options;
 }
 
-/// Through whom the caller comes: the last one in the chain presents the token.
+/// The service that presents the token: it is the last one in the chain. Empty if no service acts for the subject.
 std::string PresenterOf(const SsoClient::SamlToken &token) {
   const std::vector<SsoClient::Delegate> chain = token.GetDelegationChain();
   return chain.empty() ? "" : chain.back().subject.name + "@" + chain.back().subject.domain;

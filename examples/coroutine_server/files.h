@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// The service behind the front: it admits callers for whom the front acts.
+/// The service that `Front` calls. It accepts only callers for whom the front acts.
 
 #pragma once
 

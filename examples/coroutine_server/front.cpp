@@ -18,13 +18,13 @@ namespace Example {
 
 namespace {
 
-/// What the new token must allow, and no more: it is for one service, and ends soon.
+/// The new token allows only what is needed: it is for one service, and ends soon.
 SsoClient::TokenSpec DelegationSpec() {
   SsoClient::TokenSpec spec;
   spec.tokenLifetimeSec = 5 * 60;
   spec.delegateTo = std::string(FRONT_NAME);
   spec.audienceRestriction = {FILES_AUDIENCE};
-  spec.confirmation = SsoClient::TokenSpec::CONFIRMATION_NONE; // the other service does not see the proof of a key
+  spec.confirmation = SsoClient::TokenSpec::CONFIRMATION_NONE; // the other service cannot check the proof of a key
   return spec;
 }
 

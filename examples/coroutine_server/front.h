@@ -18,7 +18,7 @@ public:
   /// @param config has the identity of this service
   Front(const SsoClient::SecurityTokenServiceConfig &config, unsigned short filesPort);
 
-  /// Answers a request whose body is the caller's token: with the answer of the other service.
+  /// Answers a request whose body is the caller's token. The answer is that of the other service.
   boost::asio::awaitable<Reply> Answer(std::string body, TimePoint deadline) const;
 
 private:

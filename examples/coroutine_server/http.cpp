@@ -52,7 +52,7 @@ asio::awaitable<void> Answer(asio::ip::tcp::socket socket, std::shared_ptr<const
   try {
     co_await AnswerOne(tcp_stream(std::move(socket)), *handler);
   } catch (const std::exception &error) {
-    std::cerr << "a request was not answered: " << error.what() << '\n'; // its client is no longer connected, or slow
+    std::cerr << "a request was not answered: " << error.what() << '\n'; // for example, its client is too slow
   }
 }
 

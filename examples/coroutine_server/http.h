@@ -20,10 +20,10 @@ struct Reply {
   std::string text;
 };
 
-/// Answers one request: its body, and the time when its client no longer waits.
+/// Answers one request, of which it gets the body. After the deadline, the caller no longer waits.
 using Handler = std::function<boost::asio::awaitable<Reply>(std::string body, TimePoint deadline)>;
 
-/// Answers each request to the acceptor, any number at once, until the coroutine is destroyed.
+/// Answers each request that arrives at the acceptor, any number at once, until the coroutine is destroyed.
 boost::asio::awaitable<void> Serve(boost::asio::ip::tcp::acceptor acceptor, Handler handler);
 
 /// Posts the body to a service on loopback.

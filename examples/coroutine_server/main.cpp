@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// Two services on loopback as coroutines: `front`, which callers use, and `files`, which the front uses for them.
+/// Two services on loopback that are coroutines: callers use `front`, which uses `files` for them.
 ///
 /// Usage: coroutine_server https://sts.corp.example/STS/trust authority.pem sts.pem front.pem front.key 8080
 

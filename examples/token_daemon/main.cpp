@@ -36,7 +36,7 @@ struct Arguments {
   std::int64_t intervalMs = 1000;
 };
 
-/// Writes a line as a whole: the daemon and its token source print on different threads.
+/// Writes a line as a whole, because the daemon and its token source print on different threads.
 void Print(const std::string &line) {
   std::cout << line + '\n' << std::flush;
 }
@@ -56,8 +56,8 @@ Tarvel::SecretText ReadPassword(const std::string &path) {
   return password;
 }
 
-/// Calls the service for which the token is. Here that is the token service itself, which examines the token; a real
-/// daemon sends the token in its own request, and reads in the answer whether it was accepted.
+/// Calls the service that needs the token. In this example it is the token service itself, which checks the token. A
+/// real daemon sends the token in its own request, and reads in the answer whether it was accepted.
 bool Call(const SsoClient::TokenClient &client, const std::shared_ptr<const SsoClient::SamlToken> &token) {
   return client.Validate(token, SsoClient::CallOptions::WithTimeout(std::chrono::seconds(5)));
 }
@@ -74,12 +74,12 @@ void Serve(const SsoClient::TokenClient &client, const SsoClient::TokenSource &s
       source.Invalidate(token->GetId()); // the next call gets another token
     }
   } catch (const std::exception &error) {
-    // Without a token, or without an answer. The source does not ask more often than its back-off allows.
+    // There was no token, or no answer. The source does not ask more often than its back-off allows.
     Print(std::string("not served: ") + error.what());
   }
 }
 
-/// Waits for the signal or for the end of the interval. Returns whether the signal came.
+/// Waits for a signal or for the end of the interval. Returns whether a signal arrived.
 bool WaitForEnd(const sigset_t &signals, std::int64_t milliseconds) {
   const timespec interval{milliseconds / 1000, milliseconds % 1000 * 1000000};
   return sigtimedwait(&signals, nullptr, &interval) > 0;
@@ -87,14 +87,14 @@ bool WaitForEnd(const sigset_t &signals, std::int64_t milliseconds) {
 
 void Run(const SsoClient::SecurityTokenServiceConfig &config, const Arguments &arguments, const sigset_t &signals) {
   const auto client = std::make_shared<const SsoClient::TokenClient>(config);
-  // Asked for each acquisition: the daemon keeps no password, and a changed one is used at once.
+  // Called for each acquisition: the daemon keeps no password, and a changed password is used at once.
   const auto provider = [arguments]() -> SsoClient::Credential {
     return SsoClient::PasswordCredential{arguments.user, ReadPassword(arguments.passwordFile)};
   };
   SsoClient::TokenSpec spec;
   spec.tokenLifetimeSec = arguments.lifetimeSec;
   SsoClient::TokenSourceOptions options;
-  options.longestBackOff = std::chrono::seconds(5); // how long after a restart of the service it is asked again
+  options.longestBackOff = std::chrono::seconds(5); // a restarted service is asked again within this time
   const SsoClient::TokenSource source(client, provider, spec, options);
   const auto registration = source.OnChange([](const std::shared_ptr<const SsoClient::SamlToken> &token) {
     Print("new token " + token->GetId() + ", valid until " + token->GetEndDate().ToString());

@@ -87,7 +87,7 @@ private:
   std::string m_path;
   int m_descriptor = -1;
   bool m_isPublished = false;
-  const UnfinishedFile m_unfinished; // last: it ends before the others, after the destructor's body
+  const UnfinishedFile m_unfinished; // the last member: destroyed first, after the destructor's body
 };
 
 } // namespace

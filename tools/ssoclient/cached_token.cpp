@@ -18,7 +18,7 @@
 namespace SsoClient::Tool {
 namespace {
 
-/// Has the main thread ask for the credential.
+/// Makes the main thread call `credential`, and waits for the result.
 Credential AskMainThread(TaskQueue &tasks, const std::function<Credential()> &credential) {
   auto task = std::make_shared<std::packaged_task<Credential()>>(credential);
   std::future<Credential> result = task->get_future();
@@ -42,7 +42,8 @@ std::shared_ptr<const SamlToken> Get(const TokenSource &source, const std::share
   return result->Get();
 }
 
-/// The library may still write the file of a call that was cancelled. Waits for that, so that nothing is left over.
+/// After a cancelled call, the library may still write the cache file. Waits for that, so that no unfinished file is
+/// left.
 void AwaitCacheFile(const std::string &path) {
   constexpr int PATIENCE = 1000;
   constexpr useconds_t TURN_MICROSECONDS = 1000;
@@ -66,7 +67,7 @@ IssuedToken GetFrom(const TokenSource &source, const CachedTokenCall &call, cons
   return {token, call.watch->GetAskedAt()};
 }
 
-/// The library returns an issued token even if the file cannot be written.
+/// Warns if the file does not have the token: the library returns an issued token even if the file cannot be written.
 void WarnUnlessKept(const std::string &path, const SamlToken &token) {
   boost::optional<std::string> content;
   try {

@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// Getting a token from the file of --cache, or, if it has no fresh one, from the service.
+/// Gets a token from the file of --cache, or, if it has no fresh token, from the service.
 
 #pragma once
 
@@ -17,17 +17,17 @@ namespace SsoClient::Tool {
 
 class IssueWatch;
 
-/// What decides about the token.
+/// What is needed to get the token.
 struct CachedTokenCall {
   std::shared_ptr<const TokenClient> client;
   std::shared_ptr<const IssueWatch> watch; ///< the client's observer
   TokenSpec spec;
   TokenCacheOptions cache;
-  std::function<Credential()> credential; ///< called on this thread, and only when the service must be asked
-  std::function<bool(const SamlToken &token)> isAccepted; ///< whether a token of the file will do
+  std::function<Credential()> credential; ///< called on this thread, only to ask the service for a token
+  std::function<bool(const SamlToken &token)> isAccepted; ///< whether a token of the file may be used
 };
 
-/// The token; `askedAt` is set only if it was issued for this call.
+/// The token. `askedAt` is set only if the token was issued for this call.
 /// @throws what `TokenSource::Get` throws. A signal and the limit of --timeout end the call.
 IssuedToken GetCachedToken(const CachedTokenCall &call);
 

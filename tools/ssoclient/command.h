@@ -23,7 +23,7 @@ struct Command {
   const char *summary;
   const char *examples; ///< command lines, shown at the end of the help
 
-  Format format; ///< without --format
+  Format format; ///< the format without --format
 
   /// Adds the command's own options to `app`, and returns the action, which uses their values. `output` outlives both.
   Action (*define)(CLI::App &app, const OutputOptions &output);

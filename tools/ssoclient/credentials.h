@@ -30,7 +30,7 @@ struct CredentialsOptions {
   GssOptions gss;
 };
 
-/// What decides about a credential, for every kind.
+/// What is needed to read a credential of any kind.
 struct CredentialsCall {
   const TokenSpec &spec;
   const ServiceDialect &dialect;
@@ -41,7 +41,7 @@ struct CredentialsCall {
   const VerifyOptions &verifyOptions;
 };
 
-/// A credential, and why the service may refuse the request that uses it.
+/// A credential, and the reason why the service might refuse the request that uses it.
 struct DoubtedCredential {
   Credential credential;
   const Doubt *doubt; ///< null when there is none

@@ -32,7 +32,7 @@ namespace {
 
 /// How long each step may take without --timeout.
 constexpr std::chrono::microseconds DEFAULT_STEP = std::chrono::seconds(10);
-/// How much of the time of --timeout is left to show what was found; half of a shorter time.
+/// How much of the time of --timeout is kept to show the results; at most half of it.
 constexpr std::chrono::microseconds TIME_TO_SHOW = std::chrono::milliseconds(500);
 
 struct DoctorOptions {
@@ -40,7 +40,8 @@ struct DoctorOptions {
   std::vector<std::string> trustFiles;
 };
 
-/// How long one step may take: a step that hangs must end before the command must, so that the others are shown.
+/// How long one step may take. A step that hangs must end before --timeout ends the command, so that the results of the
+/// other steps are shown.
 std::chrono::microseconds StepLimit() {
   const auto limit = GetTimeLimit();
   return limit ? *limit - std::min(*limit / 2, TIME_TO_SHOW) : DEFAULT_STEP;

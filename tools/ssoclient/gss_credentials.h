@@ -21,7 +21,7 @@ struct GssOptions {
 /// @throws UsageException when the tool is built without the GSSAPI.
 void RequireGss();
 
-/// The ticket is looked for when a token is acquired.
+/// The credential. The ticket is looked for only when a token is acquired.
 /// @param url of the token service
 /// @throws Tarvel::InvalidArgumentException for a service name that is empty or lacks a part
 NegotiationCredential ToCredential(const GssOptions &options, const std::string &url);

@@ -28,27 +28,27 @@ constexpr int ENDING_SIGNALS[] = {SIGINT, SIGTERM, SIGHUP, SIGQUIT};
 
 /// How long a command has to end by itself.
 constexpr microseconds GRACE{20'000};
-/// How often a thread that waits for a file looks whether the file is complete.
+/// How often a thread that waits for a file checks whether the file is complete.
 constexpr microseconds TURN{1'000};
 
-// Why the command ends: one of these, or the number of a signal.
+// Why the process ends early: one of these, or the number of a signal.
 constexpr int NOTHING = 0;
 constexpr int TOO_LATE = -1;
 std::atomic<int> g_cause{NOTHING};
 
-std::mutex g_writing; // locked while a file is not complete, and for good once the command has ended
+std::mutex g_writing; // locked while a file is not complete, and for the rest of the process after the command
 std::mutex g_naming;  // protects the path
 std::string g_unfinishedPath;
 
 // Set before there is a second thread.
 sigset_t g_ending;   // the signals that end the process
-sigset_t g_awaited;  // these, and the one with which the main thread reports that the command has ended
-std::thread g_watch; // no thread: the command has not begun
+sigset_t g_awaited;  // these, and the signal by which the main thread reports that the command has ended
+std::thread g_watch; // not joinable before the command begins
 boost::optional<microseconds> g_timeLimit;
 boost::optional<Clock::time_point> g_deadline;
 Format g_format = Format::TEXT;
 
-/// Sent to the watching thread only. For the others, and for other processes, it is a signal without a meaning.
+/// The signal that reports the end of the command to the watching thread. No other thread or process uses it.
 int EndOfCommand() noexcept {
   return SIGRTMIN;
 }
@@ -58,7 +58,7 @@ const CancelSource &GetCancelSource() {
   return source;
 }
 
-/// Waits for one of the signals, at most until `time`. Returns its number, or 0 when the time has come.
+/// Waits for one of the signals, at most until `time`. Returns its number, or 0 after that time.
 int AwaitSignal(const sigset_t &set, const boost::optional<Clock::time_point> &time) noexcept {
   for (;;) {
     int signal = -1;
@@ -80,7 +80,7 @@ int AwaitSignal(const sigset_t &set, const boost::optional<Clock::time_point> &t
   }
 }
 
-/// Whether a signal that ends the process arrives in this time.
+/// Waits for at most `time`, and returns whether a signal that ends the process has arrived.
 bool IsInterruptedWithin(microseconds time) noexcept {
   const int signal = AwaitSignal(g_awaited, Clock::now() + time);
   return signal != 0 && signal != EndOfCommand();
@@ -93,7 +93,7 @@ std::string SecondsText(microseconds time) {
   return std::to_string(time.count() / 1'000'000) + (fraction == "." ? "" : fraction) + " s";
 }
 
-/// Does not wait: neither for a reader that does not read, nor for another thread that waits for it.
+/// Does not wait for the reader of standard error, or for another thread that waits for that reader.
 void ReportLateness() {
   const std::string text =
       FailureText(DeadlineExceededException("the command did not end within " + SecondsText(g_timeLimit.value()) +
@@ -123,11 +123,12 @@ void ReportLateness() {
   }
 }
 
-/// Waits until no file is unfinished, or a second signal has arrived; the file is then removed.
+/// Waits until no file is unfinished. After a second signal, removes the file instead.
+/// @param isImpatient whether the second signal has already arrived
 void CompleteFile(bool isImpatient) {
   while (!g_writing.try_lock()) {
     if (isImpatient || IsInterruptedWithin(TURN)) {
-      g_naming.lock(); // for good: no further file is made
+      g_naming.lock(); // never unlocked: no further file is made
       unlink(g_unfinishedPath.c_str());
       return;
     }
@@ -141,7 +142,7 @@ int AfterCommand() noexcept {
   if (cause == 0) {
     cause = g_cause;
   }
-  // Another thread may still write a file.
+  // Another thread may still be writing a file.
   while (cause == NOTHING && !g_writing.try_lock()) {
     cause = AwaitSignal(g_ending, Clock::now() + TURN);
   }
@@ -193,7 +194,7 @@ void WatchCommand(const boost::optional<microseconds> &timeout, Format format) {
     g_deadline = Clock::now() + *timeout;
   }
   g_format = format;
-  GetCancelSource(); // made here, so that a signal does not have to make it
+  GetCancelSource(); // created here, and not when a signal arrives
   sigset_t all;
   sigset_t earlier;
   sigfillset(&all);
@@ -220,7 +221,7 @@ void FinishCommand() {
   }
   pthread_kill(g_watch.native_handle(), EndOfCommand());
   g_watch.join();
-  pthread_sigmask(SIG_UNBLOCK, &g_ending, nullptr); // they end the process as they always do
+  pthread_sigmask(SIG_UNBLOCK, &g_ending, nullptr); // from now on they have their usual effect
 }
 
 void ReportAndFinish(const std::exception &failure, Format format) {

@@ -14,14 +14,14 @@
 
 namespace SsoClient::Tool {
 
-/// Passes each event on to another observer.
+/// Also passes each event on to another observer.
 class IssueWatch final : public OperationObserver {
 public:
-  /// @param next null for none
+  /// @param next the other observer; null if there is none
   explicit IssueWatch(std::shared_ptr<OperationObserver> next) : m_next(std::move(next)) {}
 
   /// When the service was asked for the latest token that it has issued, by this machine's clock; `boost::none` if it
-  /// has issued none.
+  /// has not issued any token.
   boost::optional<Tarvel::System::DateTime> GetAskedAt() const;
 
   void OnStarted(const OperationInfo &operation) override;

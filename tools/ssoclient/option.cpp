@@ -38,7 +38,7 @@ std::string RefuseArgument(const std::string &argument) {
   return argument == "true" ? "" : "takes no argument";
 }
 
-/// The time in `text`, a decimal number of seconds; `boost::none` for any other text and for a time out of range.
+/// The time in `text`, a decimal number of seconds; `boost::none` for any other text, and for a time out of range.
 boost::optional<microseconds> ParseSeconds(const std::string &text) {
   const std::size_t whole = text.find_first_not_of(DIGITS);
   const bool hasFraction = whole != std::string::npos && text[whole] == '.';

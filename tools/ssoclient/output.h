@@ -53,7 +53,7 @@ void Note(std::string_view message, const OutputOptions &output);
 /// From now on each line that the library logs is written to standard error.
 void ShowLibraryLog();
 
-/// The report of `failure`: in JSON one line, otherwise one line of text and a second one for a hint.
+/// The report of `failure`: one line in JSON; otherwise one line of text, and a second line for a hint.
 std::string FailureText(const std::exception &failure, Format format);
 
 /// Writes that report to standard error.

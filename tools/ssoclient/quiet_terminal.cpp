@@ -15,8 +15,8 @@ bool g_isQuiet = false;
 int g_terminal = -1;
 termios g_earlierSettings;
 
-/// Drops what has been typed so far: the program that next reads the terminal must not get the rest of a password. Does
-/// not wait until the terminal has shown everything: it may have been stopped.
+/// Discards what has been typed so far: the program that reads the terminal next must not get the rest of a password.
+/// Does not wait until the terminal has shown all output, because its output may have been stopped.
 void Apply(int terminal, const termios &settings) noexcept {
   tcsetattr(terminal, TCSANOW, &settings);
   tcflush(terminal, TCIFLUSH);

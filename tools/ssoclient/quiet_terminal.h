@@ -25,8 +25,8 @@ private:
   sigset_t m_earlierMask;
 };
 
-/// Makes a quiet terminal echo again, for good: no terminal becomes quiet afterwards. For a process that ends; safe on
-/// any thread.
+/// Makes a quiet terminal echo again, and prevents any terminal from becoming quiet afterwards. For the end of the
+/// process; may be called once, on any thread.
 void RestoreTerminal() noexcept;
 
 } // namespace SsoClient::Tool

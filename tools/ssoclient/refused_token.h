@@ -17,7 +17,7 @@
 namespace SsoClient::Tool {
 
 /// Saves a refused token in the file of --save-refused, and adds a hint to the failure. The client may call the sink on
-/// any thread, also after this object has been destroyed.
+/// any thread, even after this object has been destroyed.
 class RefusedToken {
 public:
   /// @param trusted the certificates with which tokens are verified
@@ -52,7 +52,7 @@ public:
 private:
   class Keeper;
 
-  /// What to do about the token that was refused; empty if none was.
+  /// What to do about the token that was refused; empty if no token was refused.
   std::string GetHint() const;
 
   std::shared_ptr<Keeper> m_keeper; // shared with the sink

@@ -53,11 +53,11 @@ struct IssuedToken {
   boost::optional<Tarvel::System::DateTime> askedAt;
 };
 
-/// Warns of a doubt, unless it is null.
+/// Prints the doubt as a warning, unless it is null.
 void WarnOf(const Doubt *doubt, const OutputOptions &output);
 
-/// The token that `call` gets. `call` asks the service and does nothing else.
-/// @param doubt null when there is none; `call` may set it
+/// Returns what `call` returns, and explains a refusal by the doubt. `call` asks the service and does nothing else.
+/// @param doubt null when there is none; `call` may set it, because it is read after the call
 /// @throws HintedException when the service refuses a doubtful request. Also throws what `CallService` throws.
 IssuedToken ExplainDoubt(const std::function<IssuedToken()> &call, const Doubt *const &doubt);
 

@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// `TaskQueue`, functions that other threads have the main thread run.
+/// `TaskQueue`, with which other threads run functions on the main thread.
 
 #pragma once
 
@@ -11,10 +11,11 @@
 
 namespace SsoClient::Tool {
 
-/// `Post` is safe on any thread. Prompts, for example, must be shown by the main thread (see `QuietTerminal`).
+/// Functions that one thread runs for the others. In the tool this is the main thread, because only it may show prompts
+/// (see `QuietTerminal`). `Post` is safe on any thread.
 class TaskQueue {
 public:
-  /// Has `task` run, or, after `Close`, discards it.
+  /// Queues `task`, or discards it after `Close`.
   void Post(std::function<void()> task);
 
   /// Runs tasks on this thread, and waits for more, until one of them has set `isDone`.

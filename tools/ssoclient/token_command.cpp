@@ -34,8 +34,8 @@ void CheckCache(const TokenOptions &options) {
   }
 }
 
-/// Whose token it is. Empty for a token of the identity alone. Tokens that are bound to different keys are different
-/// tokens.
+/// The owner of the token in the cache. Empty if the identity is the only credential. With an identity, the owner
+/// contains its certificate, because a token that is bound to another key is another token.
 std::string OwnerOf(const CredentialsOptions &credentials, const boost::optional<DoubtedCredential> &given,
                     const boost::optional<HolderOfKeyConfig> &identity) {
   std::string owner = credentials.user + credentials.gss.client;
@@ -53,7 +53,7 @@ ExitCode PrintToken(const TokenOptions &options, const OutputOptions &output) {
   const CredentialsOptions &credentials = options.request.credentials;
   boost::optional<DoubtedCredential> given;
   if (credentials.user.empty()) {
-    given = request.ReadCredential(); // a password, however, is read only when it is needed
+    given = request.ReadCredential(); // a password is read only when it is needed
   }
   const Doubt *doubt = nullptr;
   const auto readCredential = [&] {

@@ -31,9 +31,9 @@ void AddTokenOutputOptions(CLI::App &app, TokenOutputOptions &options);
 /// @throws UsageException, Tarvel::IOException
 void CheckTokenOutput(const TokenOutputOptions &options, const OutputOptions &output);
 
-/// Warns of what `spec` asks for and a token that was issued now does not have. With a file, writes the token's XML to it, and then,
-/// unless the format is XML, the report to standard output. If the file is "-", writes only the XML to standard output;
-/// without a file, only the report.
+/// If the token was issued for this command, warns of everything that `spec` asks for and the token does not have. With
+/// a file, writes the token's XML to it, and then, unless the format is XML, the report to standard output. If the file
+/// is "-", writes only the XML to standard output; without a file, only the report.
 /// @param dialect of the request
 /// @param toleranceSec see `FindUnmet`
 /// @throws Tarvel::IOException when the XML cannot be written, or, without a file, the report.

@@ -35,7 +35,7 @@ TokenRequest::TokenRequest(const TokenRequestOptions &options, const OutputOptio
   m_refused.emplace(options.tokenOutput, m_trusted, m_verifyOptions, output);
   ServiceOptions serviceOptions;
   serviceOptions.dialect = m_dialect;
-  serviceOptions.verifyOptions.profile = m_verifyOptions.profile; // the tolerance is checked later
+  serviceOptions.verifyOptions.profile = m_verifyOptions.profile; // `Write` checks the tolerance
   serviceOptions.observer = std::move(observer);
   serviceOptions.refusedTokenSink = m_refused->GetSink();
   m_identity = LoadIdentity(options.identity);

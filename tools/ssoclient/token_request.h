@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// A request for a token, as a command line describes it, and what becomes of the answer.
+/// A request for a token that a command line describes, and the output of the token.
 
 #pragma once
 
@@ -36,7 +36,7 @@ void AddTokenRequestOptions(CLI::App &app, TokenRequestOptions &options);
 /// Refers to the options, which outlive it.
 class TokenRequest {
 public:
-  /// Checks the command line, and then reads the files that it names, but no credential. Sends nothing.
+  /// Checks the command line, and then reads its files, but no credential. Sends nothing.
   /// @param observer follows the operations; null for none
   TokenRequest(const TokenRequestOptions &options, const OutputOptions &output,
                std::shared_ptr<OperationObserver> observer);
@@ -48,10 +48,10 @@ public:
   /// Reads the credential, for example a password at a prompt.
   DoubtedCredential ReadCredential() const;
 
-  /// Whether the tool accepts the token with the tolerance of the command line.
+  /// Whether the token is valid with the tolerance of the command line.
   bool IsAccepted(const SamlToken &token) const;
 
-  /// Writes the token that `call` returns, and explains why a token is refused.
+  /// Writes the token that `call` returns. If the token is refused, adds a hint to the exception.
   /// @throws what `call` throws; ParseException for a token that the tool refuses; and what `WriteToken` throws
   void Write(const std::function<IssuedToken()> &call) const;
 
