@@ -170,7 +170,7 @@ TEST_F(OneSource, RenewsByItself) {
   EventCount changes;
   const ChangeRegistration registration = source->OnChange([&](const TokenPtr &) { changes.Add(); });
   const TokenPtr first = source->Get();
-  source->Get(); // the source refreshes by itself only if it was asked since
+  source->Get(); // without this call, the source would not refresh by itself
   ASSERT_TRUE(changes.WaitFor(2));
   EXPECT_NE(source->Get()->GetId(), first->GetId());
   EXPECT_TRUE(Eventually([&] { return CountLogged("renewed, issued _") > renewedBefore; }));
