@@ -1,6 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// Two types of coroutines as programs have them: one that starts at once, and one that starts when it is awaited.
+/// Two types of coroutines that programs commonly have: one that starts at once, and one that starts when it is
+/// awaited.
 
 #pragma once
 
@@ -15,7 +16,7 @@
 
 namespace Testing {
 
-/// Starts at once, and is destroyed with this object, whether or not it has ended. What it throws ends the process.
+/// Starts at once, and is destroyed with this object, whether or not it has ended. An exception in it ends the process.
 class EagerTask {
 public:
   struct promise_type { // NOLINT(readability-identifier-naming): the language names it

@@ -1,5 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
-// Operations over TLS that are cancelled at random moments, by a request to stop a thread, and by the end of their client.
+// Operations over TLS that are cancelled at random moments, by a request to stop a thread, and by the end of their
+// client.
 #include "integration/service/service_client.h"
 #include "support/operation_forms.h"
 #include "support/process_resources.h"

@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
-// After each fault of the network or of the service, an operation of the client fails in each form with the same class and text
-// as an operation of `SecurityTokenService`, and the next operation works.
+// After each fault of the network or of the service, an operation of the client fails in each form with the same class
+// and text as an operation of `SecurityTokenService`, and the next operation works.
 
 #include "integration/client/fault_service.h"
 #include "support/data_file.h"

@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
-// Each allocation of OpenSSL fails in turn during an operation of the client. The one outcome of the operation is the token, or
-// reports that there is no memory. It never refuses the token.
+// Each allocation of OpenSSL fails in turn during an operation of the client. The one outcome of the operation is the
+// token, or reports that there is no memory. It never refuses the token.
 #include "integration/out_of_memory/failing_memory.h"
 #include "support/completion.h"
 #include "support/data_file.h"

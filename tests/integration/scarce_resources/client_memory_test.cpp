@@ -33,7 +33,7 @@ using SsoClient::TokenSource;
 constexpr int MAX_PIECES = 100000;
 const std::string BODY = IssueResponse(ReadDataFile("tokens/bearer.xml"));
 
-/// Answers each request of the connection with a token.
+/// Answers the request of one connection with a token.
 void AnswerWithAToken(ServerConnection &peer) {
   if (!peer.ReadRequest().empty()) {
     peer.Write("HTTP/1.1 200 OK\r\nContent-Type: text/xml\r\nContent-Length: " + std::to_string(BODY.size()) +

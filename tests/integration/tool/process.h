@@ -38,8 +38,8 @@ Result RunTool(const std::vector<std::string> &arguments, const std::string &inp
 /// Runs `ShellCommand(commandLine)` in `folder`.
 Result RunShell(const std::string &commandLine, const std::string &folder = Testing::DataPath("tokens"));
 
-/// Starts the tool with a standard input that stays open and silent, sends it `signal` as soon as the tool waits for that
-/// signal, and returns how the tool ended.
+/// Starts the tool with a standard input that stays open and silent, sends it `signal` as soon as the tool waits for
+/// that signal, and returns how the tool ended.
 Result RunToolAndSignal(const std::vector<std::string> &arguments, int signal);
 
 } // namespace ToolTest

@@ -1,5 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
-// An operation is cancelled, late, or without its client, at each of its steps.
+// At each of its steps, an operation is cancelled, or its deadline passes, or its client is destroyed.
 #include "client_setup.h"
 #include "stepped_time.h"
 #include "support/recorded_events.h"
@@ -283,7 +283,7 @@ TEST_F(HeldClient, EndsACallThatWaitsDuringALegOfItsHandler) {
   gate->Open();
 }
 
-TEST_F(HeldClient, EndsAMessageAfterFourMinutesWithTheTextOfTheService) {
+TEST_F(HeldClient, EndsARequestAfterFourMinutesLikeSecurityTokenService) {
   client->AcquireAsync(Alice(), SpecFor(60), options, outcomes.Record());
   transport->WaitForSent(1);
   time.Advance(std::chrono::minutes(4) - milliseconds(1));
@@ -294,7 +294,7 @@ TEST_F(HeldClient, EndsAMessageAfterFourMinutesWithTheTextOfTheService) {
   EXPECT_EQ(transport->CountCancelled(), 0);
 }
 
-TEST_F(HeldClient, LimitsAMessageToFourMinutesWhenTheDeadlineIsLater) {
+TEST_F(HeldClient, LimitsARequestToFourMinutesWhenTheDeadlineIsLater) {
   options.deadline = time.GetSteadyTime() + std::chrono::hours(1);
   client->AcquireAsync(Alice(), SpecFor(60), options, outcomes.Record());
   transport->WaitForSent(1);
@@ -341,7 +341,7 @@ TEST_F(HeldClient, ReleasesCredentialAndSpecWhenTheRequestHasBeenComposed) {
   EXPECT_EQ(outcomes.Get(), Strings());
 }
 
-TEST_F(HeldClient, KeepsTheCredentialForFurtherAttemptsUntilItIsDecided) {
+TEST_F(HeldClient, KeepsTheCredentialForFurtherAttemptsUntilTheOperationEnds) {
   auto token = Testing::HolderToken();
   const std::weak_ptr<const SamlToken> released = token;
   options.retryPolicy = RetryPolicy();

@@ -1,5 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
-// What observer, log and sink of refused tokens get from the operations of a client.
+// What the observer, the log and the sink of refused tokens receive from the operations of a client.
 #include "client_setup.h"
 #include "support/identity.h"
 #include "support/recorded_events.h"
@@ -83,7 +83,7 @@ Strings Trace(const std::function<void(const std::shared_ptr<RecordedEvents> &)>
         line.erase(at, std::string(own).size());
       }
     }
-    // Only the document's interface writes these two lines.
+    // Only `SecurityTokenService` writes these two lines.
     if (line.find("AcquireToken sending") == std::string::npos &&
         line.find("AcquireToken processing") == std::string::npos) {
       trace.push_back(line);
@@ -310,7 +310,7 @@ TEST(PerCallOptions, UseTheirOwnDialectAndVerifyOptions) {
   EXPECT_EQ(bodies->at(1).find("urn:other"), std::string::npos);
 }
 
-TEST(PerCallOptions, AreRefusedAsTheOutcome) {
+TEST(PerCallOptions, AreRefusedInTheOutcome) {
   const auto client = Testing::ClientOn(std::make_shared<ScriptedTransport>(Testing::Issue));
   CallOptions options;
   options.verifyOptions = VerifyOptions();

@@ -1,5 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
-// Many operations that end at random moments: each has exactly one outcome, and nothing is left of it.
+// Many operations that end at random moments: each has exactly one outcome, and leaves nothing in memory.
 #include "client_setup.h"
 #include "support/recorded_events.h"
 #include "support/sanitized.h"

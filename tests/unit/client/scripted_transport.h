@@ -21,15 +21,15 @@ namespace Testing {
 /// The answer to a request. With a failure there is no response.
 struct Reply {
   std::string body;
-  std::string failure{}; ///< the text of a `CommunicationException`; empty for none
+  std::string failure{}; ///< the text of a `CommunicationException`; empty if there is none
   SsoClient::ResponseFacts facts{200, "OK", "text/xml", 0, "", true};
 };
 
-/// A response with that body.
+/// A response with this body.
 Reply Success(const std::string &body);
-/// No connection was made.
+/// A failure to connect.
 Reply NoConnection();
-/// The status 503 with that value of Retry-After.
+/// The status 503 with this value of Retry-After.
 Reply Unavailable(const std::string &retryAfter);
 
 /// Safe on any thread. Completions run on the platform's I/O threads.
@@ -52,7 +52,7 @@ public:
   std::vector<std::string> Sent() const;
   /// Waits until that many requests have been sent.
   bool WaitForSent(int count) const;
-  /// How many requests were cancelled, and how many ended by the limit for a message.
+  /// How many requests were cancelled, and how many ended at their time limit.
   int CountCancelled() const;
   int CountTimedOut() const;
   /// How many sessions have not been released.

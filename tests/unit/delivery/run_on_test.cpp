@@ -171,7 +171,7 @@ TEST(RunOn, LetsAFunctionRunAnother) {
   EXPECT_TRUE(inner.HasRunElsewhere());
 }
 
-TEST(RunOn, RunsEachFunctionOnceWhateverTheExecutorsDo) {
+TEST(RunOn, RunsEachFunctionOnceEvenIfExecutorsQueueOrDropItOrThrow) {
   constexpr int COUNT = Testing::IS_SANITIZED ? 2'000 : 20'000;
   const RecordedLog log;
   std::vector<std::atomic<int>> runs(COUNT);

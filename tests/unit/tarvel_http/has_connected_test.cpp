@@ -24,7 +24,7 @@ using Testing::EventCount;
 
 const System::NetworkException REFUSED("refused");
 
-/// Ends the connect when the test says so.
+/// Ends the connect when the test decides.
 class HeldSpec final : public OneStreamSpec {
 public:
   using OneStreamSpec::OneStreamSpec;

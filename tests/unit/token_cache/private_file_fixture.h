@@ -36,7 +36,7 @@ class PrivateFileFixture : public ::testing::Test {
 protected:
   ~PrivateFileFixture() override { EXPECT_EQ(CountDescriptors(), m_descriptors); }
 
-  /// Both ways to open the file are refused.
+  /// Expects that both ways to open the file are refused.
   void ExpectRefusal(const std::string &reason) const {
     const std::string message = "Cannot use " + m_path + ": " + reason;
     EXPECT_THROWS_MESSAGE(m_file.Read(), Tarvel::IOException, message);

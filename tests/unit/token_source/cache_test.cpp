@@ -23,7 +23,7 @@ using testing::StartsWith;
 
 namespace {
 
-/// Each stage is a program of its own that uses the same file.
+/// Each stage represents a program, and both use the same file.
 class CachedSource : public testing::Test {
 protected:
   CachedSource() : m_path(m_folder / "token") {

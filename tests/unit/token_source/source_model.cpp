@@ -219,7 +219,7 @@ void SourceModel::Destroy() {
   for (const auto &call : m_waiting) {
     End(call.first, "CancelledException: The operation was cancelled because its token source was destroyed");
   }
-  // The service and the clocks stay, and so does a call of the provider, which belongs to no source any more.
+  // The service and the clocks remain. A call of the provider that is under way has no effect on the next source.
   SourceModel next;
   next.wall = wall;
   next.steady = steady;
