@@ -58,7 +58,7 @@ protected:
     return m_asked;
   }
 
-  /// The service writes its log after it has answered.
+  /// Waits for that many tokens in the log, because the service writes its log after it has answered.
   void ExpectIssued(int count) const {
     EXPECT_TRUE(Eventually([&] { return CountLogged("issued _") - m_issuedBefore >= count; }));
     EXPECT_EQ(CountLogged("issued _") - m_issuedBefore, count);

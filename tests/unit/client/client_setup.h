@@ -42,7 +42,7 @@ inline boost::optional<Reply> Issue(const SsoClient::Request &, int) {
   return Success("issued:" + BearerXml());
 }
 
-/// Holds each request.
+/// Leaves each request unanswered.
 inline boost::optional<Reply> Hold(const SsoClient::Request &, int) {
   return boost::none;
 }

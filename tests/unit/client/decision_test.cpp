@@ -70,7 +70,7 @@ std::vector<DecisionCase> Cases() {
           {"DestroyedDuringTheFinalLeg", Stage::FINAL_LEG, Cause::DESTROY}};
 }
 
-/// Stops at the gate in one leg.
+/// Waits at the gate in its final leg, or in its first one.
 class StoppingHandler final : public NegotiationHandler {
 public:
   StoppingHandler(std::shared_ptr<Gate> gate, bool isFinal) : m_gate(std::move(gate)), m_isFinal(isFinal) {}
@@ -205,7 +205,7 @@ TEST_P(Decision, CancelsARequestThatIsUnderWay) {
 INSTANTIATE_TEST_SUITE_P(At, Decision, testing::ValuesIn(Cases()),
                          [](const auto &tested) { return std::string(tested.param.name); });
 
-/// A client whose requests are held.
+/// A client whose requests are not answered before the test answers them.
 class HeldClient : public testing::Test {
 protected:
   HeldClient() {

@@ -25,7 +25,7 @@ using Testing::ScriptedTransport;
 constexpr int OPERATIONS = Testing::IS_SANITIZED ? 2000 : 20000;
 constexpr int THREADS = 4;
 
-/// Counts the starts and the ends that an observer sees, and events after the end.
+/// Counts the starts and the ends of operations.
 class CountingObserver final : public OperationObserver {
 public:
   void OnStarted(const OperationInfo &) override { ++started; }
@@ -35,7 +35,7 @@ public:
   std::atomic<int> ended{0};
 };
 
-/// The outcome of each operation: how often its callback was called.
+/// How often the callback of an operation was called.
 struct Calls {
   std::atomic<int> outcomes{0};
 };

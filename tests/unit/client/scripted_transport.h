@@ -35,7 +35,8 @@ Reply Unavailable(const std::string &retryAfter);
 /// Safe on any thread. Completions run on the platform's I/O threads.
 class ScriptedTransport final : public SsoClient::Transport {
 public:
-  /// The answer to a request; `boost::none` to hold it until the test answers or the client cancels it. May throw.
+  /// Returns the answer to a request. With `boost::none` the request waits until the test answers or the client cancels it.
+  /// May throw.
   using Script = std::function<boost::optional<Reply>(const SsoClient::Request &request, int number)>;
 
   explicit ScriptedTransport(Script script);
@@ -45,7 +46,7 @@ public:
 
   std::shared_ptr<SsoClient::TransportSession> CreateSession() const override;
 
-  /// Answers all requests that are held.
+  /// Answers all requests that wait.
   void AnswerHeld(const Reply &reply) const;
 
   /// The bodies of the requests, each after the number of its session: "1: UserPass …".

@@ -209,7 +209,7 @@ TEST_F(CachedSource, ReturnsATokenWhoseWritingTakesTooLong) {
   m_first.blocking = [&](std::function<void()> function) { queue.push_back(std::move(function)); };
   OutcomeList outcomes;
   m_first.Source().GetAsync({}, CancelToken(), outcomes.MakeCallback());
-  for (int step = 0; step < 2; ++step) { // the file, the provider
+  for (int step = 0; step < 2; ++step) { // first the file, then the provider
     queue.front()();
     queue.pop_front();
   }

@@ -189,7 +189,7 @@ void SourceModel::Advance(std::int64_t time) {
   }
 }
 
-/// Moves both clocks and does what happens at that moment.
+/// Moves both clocks to `moment`, and does what is due at that moment.
 void SourceModel::Reach(std::int64_t moment) {
   // The wall clock shows whole microseconds.
   wall += moment / 1000 - steady / 1000;
