@@ -59,7 +59,7 @@ SsoClient::TokenSpec AnySpec();
 /// Class and text of an exception, such as "CancelledException: The operation was cancelled".
 std::string Describe(const std::exception_ptr &failure);
 
-/// "token" if `acquire` returns a token, "null" if it returns null, otherwise what `Describe` returns for its exception.
+/// "token" if `acquire` returns a token, "null" if it returns null, or what `Describe` returns for its exception.
 std::string OutcomeOf(const std::function<std::shared_ptr<const SsoClient::SamlToken>()> &acquire);
 
 constexpr const char *CANCELLED = "CancelledException: The operation was cancelled";

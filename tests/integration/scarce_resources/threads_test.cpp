@@ -136,7 +136,7 @@ TEST(NoThreadDeathTest, FailsTheConnectThatNeedsTheResolver) {
   EXPECT_EXIT(ReportWithoutLookupThread(), testing::ExitedWithCode(0), testing::Eq(ALICE + failure + failure + ALICE));
 }
 
-/// The outcome of each form, one on each line: the subject of the token, or the message of the exception after its class.
+/// The outcome of each form, one on each line: the subject of the token, or the class and message of the exception.
 std::string OutcomesOfForms(const SsoClient::TokenClient &client) {
   const SsoClient::Credential credential = SsoClient::PasswordCredential{"alice", Tarvel::SecretText("secret")};
   std::string outcomes;

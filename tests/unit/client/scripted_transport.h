@@ -35,7 +35,7 @@ Reply Unavailable(const std::string &retryAfter);
 /// Safe on any thread. Completions run on the platform's I/O threads.
 class ScriptedTransport final : public SsoClient::Transport {
 public:
-  /// Returns the answer to a request. With `boost::none` the request waits until the test answers or the client cancels it.
+  /// Returns the answer to a request. With `boost::none`, the request waits until the test answers or the client cancels.
   /// May throw.
   using Script = std::function<boost::optional<Reply>(const SsoClient::Request &request, int number)>;
 

@@ -63,7 +63,7 @@ public:
 
 class HasConnected : public UserAgentTest {
 protected:
-  /// Starts a request, lets `step` end or cancel it, and returns what `HasConnected` returns in its completion function.
+  /// Starts a request, lets `step` end or cancel it, and returns what `HasConnected` reports in the completion.
   bool ReadAfter(const std::function<void()> &step) {
     bool hasConnected = false;
     EventCount ended;
