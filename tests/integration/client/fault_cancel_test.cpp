@@ -1,7 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 // An operation ends at each stage of the exchange, although the service is silent, when it is cancelled, when its
-// deadline passes, and when its client is destroyed. Its connection ends, too, without waiting for the end of the
-// client.
+// deadline passes, and when its client is destroyed. Its connection is closed, too. In the first two cases, the client
+// still exists.
 
 #include "integration/client/fault_service.h"
 #include "support/operation_forms.h"

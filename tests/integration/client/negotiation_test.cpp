@@ -68,7 +68,7 @@ TEST_P(NegotiationOfAClient, RunsEachLegOnAPoolThread) {
   EXPECT_EQ(server.GetRequests().size(), static_cast<std::size_t>(LEGS));
 }
 
-/// Throws an exception in its third leg that is not one of the library.
+/// In its third leg, throws an exception that is not one of the library.
 class ThrowingHandler final : public NegotiationHandler {
 public:
   std::shared_ptr<Bytes> NegotiateLeg(const Bytes &) override {

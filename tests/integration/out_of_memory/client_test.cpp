@@ -48,10 +48,10 @@ std::string OutcomeOf(const std::function<TokenPtr()> &operation) {
 
 class ClientWithoutMemoryForOpenSsl : public testing::TestWithParam<std::tuple<Form, Shortage>> {
 protected:
-  /// Runs the operation repeatedly. Each run has another allocation fail, until a run has no such allocation.
+  /// Runs the operation repeatedly. In run n, allocation n fails, until the operation makes fewer than n allocations.
   static void Sweep(const std::function<TokenPtr()> &operation) {
     ASSERT_EQ(OutcomeOf(operation), "done");
-    ASSERT_EQ(OutcomeOf(operation), "done"); // makes what is made once per process
+    ASSERT_EQ(OutcomeOf(operation), "done"); // creates what exists once per process
     std::map<std::string, int> outcomes;
     for (int number = 1;; ++number) {
       const FailingMemory memory(number, std::get<1>(GetParam()));

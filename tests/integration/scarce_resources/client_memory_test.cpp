@@ -120,7 +120,7 @@ TEST_P(ClientWithoutMemory, HasOneOutcomeForEachOperation) {
   const TokenClient client(ConfigOf(m_server));
   const SsoClient::Credential credential = Password();
   const SsoClient::TokenSpec spec = Spec();
-  client.Acquire(credential, spec); // makes what is made once per process
+  client.Acquire(credential, spec); // creates what exists once per process
   const SsoClient::CancelSource cancel;
   SsoClient::CallOptions options = SsoClient::CallOptions::WithTimeout(std::chrono::minutes(10));
   options.cancelToken = cancel.GetToken();
