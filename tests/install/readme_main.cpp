@@ -1,7 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// Runs what the README shows: acquires a first token with the password from standard input, and admits its bearer; does
-/// the same with a source of fresh tokens.
+/// Runs what the README shows: acquires a first token with the password from standard input and admits its bearer. Then
+/// does the same with a token of a source.
 
 #include <ssoclient/client/token_source.h>
 #include <ssoclient/saml_token.h>

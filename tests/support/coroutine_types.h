@@ -1,6 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// Two types of coroutines as programs have them: one that starts at once, and one that starts when it is awaited.
+/// Two types of coroutines that programs commonly have: one that starts at once, and one that starts when it is
+/// awaited.
 
 #pragma once
 
@@ -18,7 +19,7 @@
 namespace Testing {
 
 /// Starts at once, and is destroyed with this object, whether or not it has ended. If it ends on another thread, call
-/// `WaitUntilDone` first. What it throws ends the process.
+/// `WaitUntilDone` first. An exception in it ends the process.
 class EagerTask {
 public:
   struct promise_type { // NOLINT(readability-identifier-naming): the language names it
@@ -26,8 +27,8 @@ public:
     struct FinalAwaiter {
       bool await_ready() const noexcept { return false; }
       void await_suspend(std::coroutine_handle<promise_type> handle) const noexcept {
-        const std::shared_ptr<std::promise<void>> ended = handle.promise().ended; // outlives the coroutine
-        ended->set_value();
+        const std::shared_ptr<std::promise<void>> end = handle.promise().ended; // outlives the coroutine
+        end->set_value();
       }
       void await_resume() const noexcept {}
     };

@@ -43,8 +43,8 @@ namespace {
 using Clock = std::chrono::steady_clock;
 
 constexpr int BACKLOG = 65535;       // the kernel lowers it to its own limit
-constexpr int EVENTS = 16;           // few, so that a storm of connections is accepted between handshakes
-constexpr int LOOK_MILLISECONDS = 2; // how often the server looks whether it may answer
+constexpr int EVENTS = 16;           // few, so that new connections are accepted between handshakes
+constexpr int LOOK_MILLISECONDS = 2; // how often the server checks whether it may answer
 
 void Require(bool condition, const char *what) {
   if (!condition) {
@@ -105,7 +105,7 @@ public:
     }
   }
 
-  /// The answer fits into the socket's buffer; a connection that does not take it at once is cut.
+  /// The answer fits into the socket's buffer. A connection that does not accept all of it at once is closed.
   Stage Answer(const std::string &answer) {
     bool isSent = false;
     if (m_tls) {
@@ -147,7 +147,7 @@ private:
   }
 
   const int m_descriptor;
-  SSL *const m_tls; // null for none
+  SSL *const m_tls; // null for HTTP
   Stage m_stage = Stage::READING;
   std::string m_request;
 };
@@ -242,7 +242,7 @@ private:
 
   HeldServerState &m_state;
   const int m_listener;
-  SSL_CTX *const m_tls; // null for none
+  SSL_CTX *const m_tls; // null for HTTP
   const std::string m_answer;
   const int m_poll = ::epoll_create1(EPOLL_CLOEXEC);
   std::unordered_map<int, std::unique_ptr<Connection>> m_connections; // by descriptor

@@ -1,7 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// `HeldServer`, a server in a process of its own that answers many requests at once, when the test says so or after a
-/// time.
+/// `HeldServer`, a server in a process of its own that answers many requests at once, when the test allows it or after
+/// a delay.
 
 #pragma once
 
@@ -13,22 +13,22 @@ namespace Testing {
 
 struct HeldServerState;
 
-/// Always sends the same answer. One thread of the child serves all connections, so that the memory and the threads of
-/// the calling process are the client's alone. It uses only sockets and OpenSSL.
+/// Always sends the same answer. One thread of a child process serves all connections, so the memory and the threads of
+/// the calling process are only those of the client. The child uses only sockets and OpenSSL.
 class HeldServer {
 public:
   enum class Kind { HTTP, TLS, TLS_WITHOUT_SESSIONS };
 
-  /// Answers at once.
-  /// @param body of the answer, of the type text/xml
+  /// At first, the server answers at once.
+  /// @param body the body of the answer, of the type text/xml
   /// @throws std::runtime_error
   HeldServer(const std::string &body, Kind kind);
   HeldServer(const HeldServer &) = delete;
   HeldServer &operator=(const HeldServer &) = delete;
-  /// Ends the process.
+  /// Ends the child process.
   ~HeldServer();
 
-  /// Such as "https://localhost:4433/sts".
+  /// For example "https://localhost:4433/sts".
   const std::string &GetUrl() const noexcept { return m_url; }
 
   /// From now on no request is answered before `Release`.

@@ -14,7 +14,7 @@ using SsoClient::CallOptions;
 using SsoClient::TokenClient;
 
 #ifdef SSOCLIENT_HAS_COROUTINES
-/// A coroutine that starts at once, and whose frame ends with it.
+/// A coroutine that starts at once, and destroys its frame when it ends.
 struct Detached {
   struct promise_type {
     Detached get_return_object() const noexcept { return {}; }

@@ -1,7 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// The forms in which an operation of `TokenClient` or `TokenSource` can be run, behind one function for each operation. Each
-/// waits for the outcome, and throws a failure in its own class.
+/// The forms in which an operation of `TokenClient` or `TokenSource` can be run, with one function for each operation.
+/// Each function waits for the outcome, and throws a failure in its own class.
 
 #pragma once
 
@@ -22,7 +22,7 @@ using TokenPtr = std::shared_ptr<const SsoClient::SamlToken>;
 
 enum class Form { WAITING, CALLBACK, FUTURE, AWAITABLE };
 
-/// Those that the compiler has.
+/// The forms that this compiler supports.
 std::vector<Form> AllForms();
 
 /// "Waiting", "Callback", "Future", "Awaitable".
@@ -36,7 +36,7 @@ bool Validate(Form form, const SsoClient::TokenClient &client, const TokenPtr &t
               const SsoClient::CallOptions &options = {});
 TokenPtr Get(Form form, const SsoClient::TokenSource &source, const SsoClient::GetOptions &options = {});
 
-/// Waits for an outcome; throws std::runtime_error when none comes.
+/// Waits for an outcome; throws std::runtime_error if there is none in time.
 template <typename Value>
 Value Await(std::future<Value> future) {
   if (future.wait_for(PATIENCE) != std::future_status::ready) {

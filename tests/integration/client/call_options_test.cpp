@@ -87,7 +87,7 @@ TEST_P(OptionsOfACall, ReplaceTheDialect) {
 INSTANTIATE_TEST_SUITE_P(Forms, OptionsOfACall, testing::ValuesIn(AllForms()),
                          [](const auto &form) { return NameOf(form.param); });
 
-TEST(ExecutorOfACall, RunsTheCallbackInPlaceOfTheClients) {
+TEST(ExecutorOfACall, ReplacesTheExecutorOfTheClient) {
   const auto context = TrustingContext();
   std::vector<std::string> ran;
   std::mutex mutex;

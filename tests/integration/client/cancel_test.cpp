@@ -1,5 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
-// Operations over TLS that are cancelled at random moments, by the end of a thread, and by the end of their client.
+// Operations over TLS that are cancelled at random moments, by a request to stop a thread, and by the end of their
+// client.
 #include "integration/service/service_client.h"
 #include "support/operation_forms.h"
 #include "support/process_resources.h"
@@ -88,7 +89,7 @@ protected:
   const Tarvel::Ref<Tarvel::Ssl::SSLContext> m_context = TrustingContext();
 };
 
-TEST_F(CancelledOperations, HaveOneOutcomeEachAtRandomMoments) {
+TEST_F(CancelledOperations, HaveOneOutcomeEachWhenTheyAreCancelledAtRandomMoments) {
   constexpr int OPERATIONS = IS_SANITIZED ? 100 : 400;
   constexpr int AT_ONCE = 20;
   const auto client = Client(RunningService().GetUrl());
@@ -104,7 +105,7 @@ TEST_F(CancelledOperations, HaveOneOutcomeEachAtRandomMoments) {
     options.cancelToken = underWay.back().GetToken();
     client->AcquireAsync(ALICES, SpecFor(60), options, outcomes.ForNext());
     if (underWay.size() == AT_ONCE) {
-      // The operations are at different steps by now. Half of them are cancelled, the others go on.
+      // The operations are at different steps by now. Half of them are cancelled, and the others continue.
       std::shuffle(underWay.begin(), underWay.end(), random);
       std::for_each(underWay.begin(), underWay.begin() + AT_ONCE / 2, [](const CancelSource &one) { one.Cancel(); });
       underWay.clear();
@@ -121,7 +122,7 @@ TEST_F(CancelledOperations, HaveOneOutcomeEachAtRandomMoments) {
   EXPECT_NE(client->Acquire(ALICES, SpecFor(60)), nullptr);
 }
 
-TEST_F(CancelledOperations, HoldNoThreadWhileTheyWait) {
+TEST_F(CancelledOperations, OccupyNoThreadWhileTheyWait) {
   constexpr int OPERATIONS = 150;
   const auto sent = std::make_shared<SentRequests>();
   ClientOptions options;
@@ -142,7 +143,7 @@ TEST_F(CancelledOperations, HoldNoThreadWhileTheyWait) {
   EXPECT_EQ(outcomes.Get(), (std::map<std::string, int>{{"The operation was cancelled", OPERATIONS}}));
 }
 
-TEST_F(CancelledOperations, EndWithTheirClientWithoutAWait) {
+TEST_F(CancelledOperations, EndWhenTheirClientIsDestroyed) {
   constexpr int OPERATIONS = 50;
   const auto sent = std::make_shared<SentRequests>();
   ClientOptions options;
@@ -171,7 +172,7 @@ TEST_F(CancelledOperations, EndWhenTheLastCallbackDestroysTheClient) {
 }
 
 #if defined(__cpp_lib_jthread)
-TEST_F(CancelledOperations, EndWithTheThreadThatWaitsForThem) {
+TEST_F(CancelledOperations, EndWhenTheThreadThatWaitsForThemMustStop) {
   const auto sent = std::make_shared<SentRequests>();
   ClientOptions clientOptions;
   clientOptions.service.observer = sent;

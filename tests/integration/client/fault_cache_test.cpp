@@ -28,7 +28,7 @@ namespace {
 
 using namespace Testing;
 
-/// A source that shares the file, as each program makes one.
+/// A source that shares the file. Each program makes such a source.
 std::unique_ptr<TokenSource> MakeSource(const FaultService &service, const std::string &path) {
   TokenSourceOptions options;
   options.cache = TokenCacheOptions{path, "alice@corp.example"};

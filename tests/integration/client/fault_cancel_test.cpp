@@ -1,6 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
-// An operation that is cancelled, late or without its client ends while the service is silent, at each stage of the exchange,
-// and its connection ends too, while the client still exists.
+// An operation ends at each stage of the exchange, although the service is silent, when it is cancelled, when its
+// deadline passes, and when its client is destroyed. Its connection is closed, too. In the first two cases, the client
+// still exists.
 
 #include "integration/client/fault_service.h"
 #include "support/operation_forms.h"
@@ -29,8 +30,8 @@ using namespace std::chrono_literals;
 
 /// What the service has seen. Shared with its scripts.
 struct Seen {
-  EventCount reached; ///< a connection is at the stage
-  EventCount ended;   ///< and the client has ended it
+  EventCount reached; ///< connections that are at the stage
+  EventCount ended;   ///< those that the client has ended then
 };
 
 struct Stage {
@@ -43,7 +44,7 @@ void PrintTo(const Stage &stage, std::ostream *out) {
   *out << stage.name;
 }
 
-/// Makes the handshake, reads the request and writes these bytes.
+/// Completes the handshake, reads the request and writes these bytes.
 Stage After(const std::string &name, bool isSecure, const std::string &bytes) {
   return {name, isSecure, Reply(bytes)};
 }
@@ -89,7 +90,7 @@ protected:
   std::unique_ptr<TokenClient> m_client = m_service.CreateClient();
 };
 
-TEST_P(SilentService, IsLeftAtOnceByAnOperationThatIsCancelled) {
+TEST_P(SilentService, LosesTheConnectionAtOnceWhenTheOperationIsCancelled) {
   int operations = 0;
   for (const Form form : AllForms()) {
     ++operations;
@@ -106,7 +107,7 @@ TEST_P(SilentService, IsLeftAtOnceByAnOperationThatIsCancelled) {
   EXPECT_EQ(OutcomeOf([&] { return Run(Form::WAITING, *m_client, {}); }), "token");
 }
 
-TEST_P(SilentService, IsLeftAtTheDeadline) {
+TEST_P(SilentService, LosesTheConnectionAtTheDeadline) {
   int operations = 0;
   for (const Form form : AllForms()) {
     ++operations;
@@ -118,7 +119,7 @@ TEST_P(SilentService, IsLeftAtTheDeadline) {
   EXPECT_EQ(OutcomeOf([&] { return Run(Form::WAITING, *m_client, {}); }), "token");
 }
 
-TEST_P(SilentService, IsLeftWhenTheClientIsDestroyed) {
+TEST_P(SilentService, LosesTheConnectionWhenTheClientIsDestroyed) {
   const auto promise = std::make_shared<std::promise<TokenPtr>>();
   m_client->AcquireAsync(AnyCredential(), AnySpec(), {}, Fulfil(promise));
   auto future = m_client->AcquireFuture(AnyCredential(), AnySpec(), {});
@@ -132,7 +133,7 @@ TEST_P(SilentService, IsLeftWhenTheClientIsDestroyed) {
 INSTANTIATE_TEST_SUITE_P(At, SilentService, testing::ValuesIn(STAGES),
                          [](const testing::TestParamInfo<Stage> &test) { return test.param.name; });
 
-/// A service that sends its answer byte by byte, each of which would extend a time-out that counts from the last one.
+/// A service that sends its answer byte by byte. Each byte would extend a time-out that counted from the previous byte.
 class DrippingService : public testing::TestWithParam<bool> {
 protected:
   FaultService m_service{[](ServerConnection &peer) {
@@ -145,7 +146,7 @@ protected:
   const std::unique_ptr<TokenClient> m_client = m_service.CreateClient();
 };
 
-TEST_P(DrippingService, IsLeftWhenTheOperationIsCancelled) {
+TEST_P(DrippingService, LosesTheConnectionWhenTheOperationIsCancelled) {
   const CancelSource source;
   CallOptions options;
   options.cancelToken = source.GetToken();
@@ -156,7 +157,7 @@ TEST_P(DrippingService, IsLeftWhenTheOperationIsCancelled) {
   EXPECT_TRUE(Eventually([this] { return m_service.GetServer().GetOpenCount() == 0; }));
 }
 
-TEST_P(DrippingService, IsLeftAtTheDeadline) {
+TEST_P(DrippingService, LosesTheConnectionAtTheDeadline) {
   for (const Form form : AllForms()) {
     const CallOptions options = CallOptions::WithTimeout(50ms);
     EXPECT_EQ(OutcomeOf([&] { return Acquire(form, *m_client, AnyCredential(), AnySpec(), options); }), LATE)
@@ -232,7 +233,7 @@ INSTANTIATE_TEST_SUITE_P(Over, ClientConnections, testing::Bool(), [](const test
   return std::string(test.param ? "Tls" : "Tcp");
 });
 
-/// A resolver that gives no answer before it is released.
+/// A resolver that does not answer before the gate opens.
 class SilentResolver : public testing::Test {
 protected:
   SilentResolver()
@@ -249,7 +250,7 @@ private:
   const Tarvel::System::ScopedNameLookup m_lookup;
 };
 
-TEST_F(SilentResolver, IsLeftByOperationsThatAreCancelledLateOrWithoutTheirClient) {
+TEST_F(SilentResolver, DoesNotDelayOperationsThatAreCancelledLateOrWithoutTheirClient) {
   auto client = std::make_unique<TokenClient>(m_service.GetConfig("sts-without-answer.example"));
   const CancelSource source;
   CallOptions options;

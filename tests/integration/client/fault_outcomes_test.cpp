@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
-// Each fault of the network or of the service ends an operation of the client with the class and the text with which it ends
-// one of `SecurityTokenService`, in each form, and the next operation works.
+// After each fault of the network or of the service, an operation of the client fails in each form with the same class
+// and text as an operation of `SecurityTokenService`, and the next operation works.
 
 #include "integration/client/fault_service.h"
 #include "support/data_file.h"
@@ -90,7 +90,7 @@ const Fault FAULTS[] = {
 
 class ClientFaults : public testing::TestWithParam<std::tuple<Fault, bool>> {};
 
-TEST_P(ClientFaults, EndTheOperationAsTheyEndThatOfTheServiceAndTheNextOneWorks) {
+TEST_P(ClientFaults, HaveTheSameOutcomeAsInSecurityTokenServiceAndTheNextOperationWorks) {
   const auto &[fault, isSecure] = GetParam();
   FaultService service(fault.script, isSecure);
   const auto synchronous = CreateSecurityTokenService(service.GetConfig());
@@ -134,7 +134,7 @@ const Fault TLS_FAULTS[] = {
 INSTANTIATE_TEST_SUITE_P(Before, ClientFaults, testing::Combine(testing::ValuesIn(TLS_FAULTS), testing::Values(true)),
                          NameOfCase);
 
-TEST(ClientFault, ThatIsARefusedConnectionIsReported) {
+TEST(ClientFault, IsReportedForARefusedConnection) {
   const UnusedPort port;
   FaultService service(Reply(""), false);
   SecurityTokenServiceConfig config = service.GetConfig();

@@ -1,5 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
-// What is tried again, and how often, as the service and the resolver see it.
+// Which requests are sent again, and how often. The service and the resolver count them.
 
 #include "integration/client/fault_service.h"
 #include "support/operation_forms.h"
@@ -26,7 +26,7 @@ using namespace std::chrono_literals;
 
 constexpr int ATTEMPTS = 3;
 
-/// Waits as shortly as the service allows.
+/// A policy whose own delays are so short that only the service decides how long the client waits.
 RetryPolicy Patient(int attempts = ATTEMPTS) {
   RetryPolicy policy;
   policy.attempts = attempts;
@@ -53,7 +53,7 @@ std::string Unavailable(const std::string &retryAfter) {
 struct Answer {
   std::string name;
   std::string response;
-  int requests; ///< that the service gets
+  int requests; ///< how many the service receives
   std::string outcome;
 };
 
@@ -112,7 +112,7 @@ ScriptedServer::Script AvailableAfter(int unavailable, const std::string &retryA
   };
 }
 
-TEST(RetryPolicyOfAClient, IsToTryOnceUnlessItIsSet) {
+TEST(RetryPolicyOfAClient, TriesOnceByDefault) {
   FaultService service(AvailableAfter(1, "0"), false);
   const auto client = service.CreateClient();
   EXPECT_EQ(OutcomeOf([&] { return client->Acquire(AnyCredential(), AnySpec()); }), DOWN);
@@ -130,7 +130,7 @@ TEST(RetryPolicyOfAClient, ReachesAServiceThatIsAvailableAgain) {
   }
 }
 
-TEST(RetryPolicyOfAClient, IsReplacedByThatOfTheCall) {
+TEST(RetryPolicyOfAClient, IsReplacedByThePolicyOfTheCall) {
   FaultService service(AvailableAfter(1, "0"), false);
   ClientOptions options;
   options.retryPolicy = Patient();
@@ -158,7 +158,7 @@ TEST(RetryPolicyOfAClient, EndsAtOnceWithTheFailureIfTheWaitIsLongerThanTheDeadl
   EXPECT_EQ(service.GetServer().GetConnectionCount(), 1);
 }
 
-TEST(RetryPolicyOfAClient, IsLeftWhenTheOperationIsCancelledDuringTheWait) {
+TEST(RetryPolicyOfAClient, EndsItsWaitWhenTheOperationIsCancelled) {
   FaultService service(AvailableAfter(1, "1000000"), false);
   const auto client = service.CreateClient();
   const CancelSource source;
@@ -197,7 +197,7 @@ TEST(RetryPolicyOfAClient, DoesNotRepeatARequestThatTheServiceMayHaveActedUpon) 
   }
 }
 
-/// Counts the look-ups of names, which are as many as attempts to connect.
+/// Counts the look-ups of names. There is one for each attempt to connect.
 class RefusedConnection : public testing::Test {
 protected:
   std::string Acquire(const TokenClient &client, const CallOptions &options) const {

@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// `FaultService`, a token service on loopback that misbehaves as a test says, and what a client reports about it.
+/// `FaultService`, a token service on loopback with the fault that a test chooses, and what a client reports about it.
 
 #pragma once
 
@@ -19,7 +19,7 @@ namespace Testing {
 
 class FaultService {
 public:
-  /// @param script of each connection, until `Repair`. It makes the handshake itself.
+  /// @param script of each connection until `Repair` is called; the script completes the handshake itself
   FaultService(ScriptedServer::Script script, bool isSecure);
 
   /// The configuration for this service. This object owns the TLS context.
@@ -50,7 +50,7 @@ std::string HttpResponse(const std::string &status, const std::string &body, con
 /// The response that contains a bearer token.
 const std::string &TokenResponse();
 
-/// A script that makes the handshake, reads the request and writes these bytes.
+/// A script that completes the handshake, reads the request and writes these bytes.
 ScriptedServer::Script Reply(std::string bytes);
 
 SsoClient::Credential AnyCredential();
@@ -59,7 +59,7 @@ SsoClient::TokenSpec AnySpec();
 /// Class and text of an exception, such as "CancelledException: The operation was cancelled".
 std::string Describe(const std::exception_ptr &failure);
 
-/// "token" if `acquire` returns a token, otherwise what `Describe` says about its exception.
+/// "token" if `acquire` returns a token, "null" if it returns null, or what `Describe` returns for its exception.
 std::string OutcomeOf(const std::function<std::shared_ptr<const SsoClient::SamlToken>()> &acquire);
 
 constexpr const char *CANCELLED = "CancelledException: The operation was cancelled";

@@ -34,7 +34,7 @@ struct SentRequests final : OperationObserver {
 
 class ClientOverTls : public testing::TestWithParam<Form> {
 protected:
-  /// A client of the running service with this identity, or with none.
+  /// A client of the running service with this identity; without one if it is empty.
   std::unique_ptr<TokenClient> Client(const std::string &identity = "", const std::string &url = "") const {
     return std::make_unique<TokenClient>(
         ConfigFor(*m_context, identity, url.empty() ? RunningService().GetUrl() : url));

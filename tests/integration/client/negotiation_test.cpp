@@ -68,7 +68,7 @@ TEST_P(NegotiationOfAClient, RunsEachLegOnAPoolThread) {
   EXPECT_EQ(server.GetRequests().size(), static_cast<std::size_t>(LEGS));
 }
 
-/// Throws what is no exception of the library in its third leg.
+/// In its third leg, throws an exception that is not one of the library.
 class ThrowingHandler final : public NegotiationHandler {
 public:
   std::shared_ptr<Bytes> NegotiateLeg(const Bytes &) override {
@@ -93,7 +93,7 @@ TEST_P(NegotiationOfAClient, EndsWithWhatTheHandlerThrows) {
   EXPECT_EQ(server.GetRequests().size(), 2u);
 }
 
-/// Waits in its first leg until the test lets it go on.
+/// Waits in its first leg until the test lets it continue.
 class BlockedHandler final : public NegotiationHandler {
 public:
   explicit BlockedHandler(std::shared_ptr<Gate> gate) : m_gate(std::move(gate)) {}
@@ -106,7 +106,7 @@ private:
   const std::shared_ptr<Gate> m_gate;
 };
 
-TEST_P(NegotiationOfAClient, GoesOnWithoutTheOperationWhenALegCannotBeInterrupted) {
+TEST_P(NegotiationOfAClient, EndsBeforeALegThatCannotBeInterrupted) {
   const PostingServer server({});
   const TokenClient client(Testing::ConfigFor(server.GetUrl()));
   const auto gate = std::make_shared<Gate>();

@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
-// ThreadSanitizer does not see how the standard library counts the owners of an exception, because that library is compiled
-// without it. So it would report the destruction of each exception that two threads have owned.
+// The standard library is compiled without ThreadSanitizer, which therefore does not see how that library counts the
+// owners of an exception, and would report the destruction of each exception that two threads have owned.
 
 extern "C" const char *ThreadSanitizerSuppressions() __asm__("__tsan_default_suppressions");
 

@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 // Operations with cancels and deadlines at random moments: each has one outcome, and memory, descriptors and threads
-// stay as they are.
+// do not grow.
 
 #include "integration/client/fault_service.h"
 #include "support/process_resources.h"
@@ -31,7 +31,7 @@ using namespace Testing;
 
 constexpr std::size_t MOST_UNDER_WAY = 64;
 
-/// Answers most requests at once, some after a moment, and some never.
+/// Answers most requests at once, some after a millisecond, and some never.
 ScriptedServer::Script Unsteady() {
   const auto count = std::make_shared<std::atomic<unsigned>>(0);
   return [count](ServerConnection &peer) {
@@ -89,7 +89,7 @@ public:
     }
   }
 
-  /// Whether the service and its connections are idle.
+  /// Waits until all connections of the service are closed. Returns false if they are not closed in time.
   bool IsQuiet() const {
     return Eventually([this] { return m_service.GetServer().GetOpenCount() == 0; });
   }
@@ -144,7 +144,7 @@ private:
     }
   }
 
-  /// Waits for the oldest operation, which is cancelled, because the service may be silent.
+  /// Cancels the oldest operation, because the service may be silent, and waits for its outcome.
   void Finish() {
     const UnderWay &oldest = m_underWay.front();
     oldest.source.Cancel();
@@ -152,7 +152,7 @@ private:
     m_finished.push_back(oldest.outcomes);
     m_underWay.pop_front();
     if (m_finished.size() > MOST_UNDER_WAY) {
-      EXPECT_EQ(*m_finished.front(), 1); // a second outcome would have come by now
+      EXPECT_EQ(*m_finished.front(), 1); // a second outcome would have arrived by now
       m_finished.pop_front();
     }
   }

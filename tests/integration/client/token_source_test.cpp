@@ -58,7 +58,7 @@ protected:
     return m_asked;
   }
 
-  /// The service writes its log after it has answered.
+  /// Waits for that many tokens in the log, because the service writes its log after it has answered.
   void ExpectIssued(int count) const {
     EXPECT_TRUE(Eventually([&] { return CountLogged("issued _") - m_issuedBefore >= count; }));
     EXPECT_EQ(CountLogged("issued _") - m_issuedBefore, count);
@@ -170,7 +170,7 @@ TEST_F(OneSource, RenewsByItself) {
   EventCount changes;
   const ChangeRegistration registration = source->OnChange([&](const TokenPtr &) { changes.Add(); });
   const TokenPtr first = source->Get();
-  source->Get(); // the source refreshes by itself only if it was asked since
+  source->Get(); // without this call, the source would not refresh by itself
   ASSERT_TRUE(changes.WaitFor(2));
   EXPECT_NE(source->Get()->GetId(), first->GetId());
   EXPECT_TRUE(Eventually([&] { return CountLogged("renewed, issued _") > renewedBefore; }));

@@ -16,7 +16,7 @@
 namespace SsoClient {
 namespace {
 
-/// Forks when a request is about to be sent. The operation goes on in the parent only.
+/// Forks when a request is about to be sent. The operation continues in the parent only.
 class ForkingObserver final : public OperationObserver {
 public:
   explicit ForkingObserver(pid_t &child) : m_child(child) {}

@@ -88,7 +88,7 @@ TEST_P(ClientAfterFork, RunsNoCallbackOfTheParentInTheChild) {
   for (int i = 0; i < 5; ++i) {
     EXPECT_EQ(RunInChild([&] { ExpectToAcquire(*m_client); }), "");
   }
-  // In the child, the parent's operations do not exist: nothing is left to cancel.
+  // In the child, the parent's operations do not exist, so there is nothing to cancel.
   EXPECT_EQ(RunInChild([&] {
               cancel.Cancel();
               ExpectToAcquire(*m_client);

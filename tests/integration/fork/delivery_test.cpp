@@ -57,7 +57,7 @@ TEST(CancellationAfterFork, PassesThroughTheTokensOfTheParent) {
   EXPECT_FALSE(either.IsCancelled());
 }
 
-TEST(CancellationAfterFork, WorksWhateverTheThreadsOfTheParentDid) {
+TEST(CancellationAfterFork, WorksEvenIfThreadsOfTheParentWereRegistering) {
   const CancelSource source;
   std::atomic<bool> isOver{false};
   std::vector<std::thread> threads;
@@ -88,8 +88,8 @@ TEST(CallbackAfterFork, RunsOnlyInTheParent) {
   std::vector<std::function<void()>> queue;
   RunOn([&queue](std::function<void()> function) { queue.push_back(std::move(function)); }, [&runs] { ++*runs; });
   EXPECT_EQ(RunInChild([&] {
-              queue.front()(); // as a loop does that the child goes on with
-              queue.clear();   // drops the order, but is no reason to run the function elsewhere
+              queue.front()(); // like an event loop that continues in the child
+              queue.clear();   // releases the function, which must not run elsewhere because of this
               EventCount ran;
               RunOn({}, [&ran] { ran.Add(); });
               EXPECT_TRUE(ran.WaitFor(1)) << "the child's own callback";

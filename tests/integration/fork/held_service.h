@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// `HeldService`, a token service in a process of its own, which holds some answers back.
+/// `HeldService`, a token service in a process of its own, which delays some answers until the test allows them.
 
 #pragma once
 
@@ -20,7 +20,7 @@
 
 namespace Testing {
 
-/// Answers each request with a token. The answer to the user "slow" waits for `Answer`.
+/// Answers each request with a token. The answer to "slow@corp.example" waits until `Answer` is called.
 class HeldService {
 public:
   explicit HeldService(bool isSecure)
@@ -36,7 +36,7 @@ public:
   }
   int GetPort() const { return m_server.GetPort(); }
 
-  /// Waits for `count` requests whose answers are held back. Returns false if they do not arrive in time.
+  /// Waits for `count` requests whose answers are delayed. Returns false if they do not arrive in time.
   bool WaitForHeld(int count) const {
     return Eventually([this, count] { return *m_held >= count; });
   }

@@ -108,8 +108,8 @@ struct ChildEnder {
 };
 thread_local ChildEnder ender;
 
-// A blocked function keeps two timers waiting until both are due. The first one's function forks, and the child continues
-// its parent's step.
+// A blocked function keeps two timers waiting until both are due. The function of the first timer forks, and the
+// child's thread continues in the middle of the parent's loop over both timers.
 TEST(TimerAfterFork, CallsNoFurtherFunctionInAChildThatAFunctionMade) {
   const auto gate = std::make_shared<Gate>();
   StartTimer(Clock::now(), [gate] { gate->Pass(); });

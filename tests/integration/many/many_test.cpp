@@ -1,6 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
-// Ten thousand acquisitions under way at once, against a service in a process of its own, which answers none before all
-// have arrived: threads, memory, and that each has exactly one right outcome.
+// Ten thousand acquisitions under way at once, against a service in a process of its own, which answers no request
+// before all have arrived. The tests limit threads and memory, and expect exactly one right outcome of each
+// acquisition.
 #include "support/data_file.h"
 #include "support/held_server.h"
 #include "support/posting_server.h"
@@ -29,8 +30,8 @@ constexpr int MANY = Testing::IS_SANITIZED ? 1'000 : 10'000;
 constexpr unsigned long SPARE_DESCRIPTORS = 100;
 constexpr std::size_t MOST_THREADS = 8;
 
-/// How many at once. A full handshake takes most of a millisecond, so there are fewer over TLS unless the tests run in
-/// full; the memory of each is the same.
+/// How many acquisitions are under way at once. A full handshake takes most of a millisecond, so there are fewer over
+/// TLS unless the tests run in full. The memory of each acquisition does not depend on the number.
 int CountFor(HeldServer::Kind kind) {
   return kind == HeldServer::Kind::HTTP ? MANY : Testing::Repetitions(MANY, 1'000);
 }

@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
-// Whichever allocation of OpenSSL fails during an operation of the client: its one outcome is the token, or reports that
-// there is no memory. It is never a verdict on the token.
+// Each allocation of OpenSSL fails in turn during an operation of the client. The one outcome of the operation is the
+// token, or reports that there is no memory. It never refuses the token.
 #include "integration/out_of_memory/failing_memory.h"
 #include "support/completion.h"
 #include "support/data_file.h"
@@ -48,10 +48,10 @@ std::string OutcomeOf(const std::function<TokenPtr()> &operation) {
 
 class ClientWithoutMemoryForOpenSsl : public testing::TestWithParam<std::tuple<Form, Shortage>> {
 protected:
-  /// Runs the operation with every allocation failing in turn, until none is left to fail.
+  /// Runs the operation repeatedly. In run n, allocation n fails, until the operation makes fewer than n allocations.
   static void Sweep(const std::function<TokenPtr()> &operation) {
     ASSERT_EQ(OutcomeOf(operation), "done");
-    ASSERT_EQ(OutcomeOf(operation), "done"); // makes what is made once per process
+    ASSERT_EQ(OutcomeOf(operation), "done"); // creates what exists once per process
     std::map<std::string, int> outcomes;
     for (int number = 1;; ++number) {
       const FailingMemory memory(number, std::get<1>(GetParam()));

@@ -33,7 +33,7 @@ using SsoClient::TokenSource;
 constexpr int MAX_PIECES = 100000;
 const std::string BODY = IssueResponse(ReadDataFile("tokens/bearer.xml"));
 
-/// Answers each request with a token, any number of them.
+/// Answers the request of one connection with a token.
 void AnswerWithAToken(ServerConnection &peer) {
   if (!peer.ReadRequest().empty()) {
     peer.Write("HTTP/1.1 200 OK\r\nContent-Type: text/xml\r\nContent-Length: " + std::to_string(BODY.size()) +
@@ -120,7 +120,7 @@ TEST_P(ClientWithoutMemory, HasOneOutcomeForEachOperation) {
   const TokenClient client(ConfigOf(m_server));
   const SsoClient::Credential credential = Password();
   const SsoClient::TokenSpec spec = Spec();
-  client.Acquire(credential, spec); // makes what is made once per process
+  client.Acquire(credential, spec); // creates what exists once per process
   const SsoClient::CancelSource cancel;
   SsoClient::CallOptions options = SsoClient::CallOptions::WithTimeout(std::chrono::minutes(10));
   options.cancelToken = cancel.GetToken();

@@ -14,7 +14,7 @@ enum class Shortage { NONE, OF_ONE_PIECE, FROM_ONE_PIECE_ON };
 /// The shortage lasts until `EndShortage`. Returns whether `start` threw.
 bool StartShortOfMemory(Shortage shortage, int pieces, const std::function<void()> &start);
 
-/// While it exists, allocations of this thread succeed. For a part of `start`.
+/// Protects a part of `start`: while this object exists, allocations of its thread succeed.
 class EnoughMemory {
 public:
   EnoughMemory() noexcept;

@@ -57,7 +57,7 @@ public:
 
   /// A client that reaches the service by `host`: its address or its name.
   ServicePtr GetService(const std::string &host = "127.0.0.1") const { return ServiceAt(GetUrl(host)); }
-  /// The configuration of a client that reaches it by its address.
+  /// The configuration of a client that reaches the service by its address.
   SsoClient::SecurityTokenServiceConfig GetConfig() const { return ConfigFor(GetUrl("127.0.0.1")); }
 
 private:
@@ -136,7 +136,7 @@ TEST(NoThreadDeathTest, FailsTheConnectThatNeedsTheResolver) {
   EXPECT_EXIT(ReportWithoutLookupThread(), testing::ExitedWithCode(0), testing::Eq(ALICE + failure + failure + ALICE));
 }
 
-/// The outcome of each form, one on each line. For an exception that the start throws, the text begins with "thrown ".
+/// The outcome of each form, one on each line: the subject of the token, or the class and message of the exception.
 std::string OutcomesOfForms(const SsoClient::TokenClient &client) {
   const SsoClient::Credential credential = SsoClient::PasswordCredential{"alice", Tarvel::SecretText("secret")};
   std::string outcomes;

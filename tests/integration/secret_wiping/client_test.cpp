@@ -86,7 +86,7 @@ protected:
   const Tarvel::Ref<Tarvel::Ssl::SSLContext> m_context = ContextThatTrustsTheTestAuthority();
 };
 
-/// Waits until `client`'s last operation has released its memory, which may be after its outcome.
+/// Waits until the operation with this observer has released its memory, which may be after its outcome.
 void WaitForRelease(const std::weak_ptr<OperationObserver> &observer) {
   EXPECT_TRUE(Eventually([&] { return observer.expired(); }));
   EXPECT_TRUE(DrainIoThreads());

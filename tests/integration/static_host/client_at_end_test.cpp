@@ -32,11 +32,11 @@ void ExpectToEnd(const std::string &mode, const std::string &output) {
   }
 }
 
-TEST(EndOfAProcessWithOperationsUnderWay, WaitsForNoneOfAClientThatIsNeverDestroyed) {
+TEST(EndOfAProcessWithOperationsUnderWay, DoesNotWaitForAClientThatIsNeverDestroyed) {
   ExpectToEnd("never-destroyed", "main ends\n");
 }
 
-TEST(EndOfAProcessWithOperationsUnderWay, WaitsForNoneOfAStaticClient) {
+TEST(EndOfAProcessWithOperationsUnderWay, DoesNotWaitForAStaticClient) {
   ExpectToEnd("static", "main ends\n");
 }
 
@@ -44,7 +44,7 @@ TEST(EndOfAProcessWithOperationsUnderWay, EndsAnOperationThatBeginsInAnExitHandl
   ExpectToEnd("at-exit", "main ends\natexit: CommunicationException\n");
 }
 
-TEST(EndOfAProcessWithOperationsUnderWay, WaitsForNoneOfADetachedThread) {
+TEST(EndOfAProcessWithOperationsUnderWay, DoesNotWaitForDetachedThreads) {
   ExpectToEnd("detached", "main ends\n");
 }
 

@@ -1,5 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
-// Each command ends at a signal and at the limit of --timeout, wherever it waits, and leaves nothing behind.
+// Each command ends at a signal and at the limit of --timeout, wherever it waits, and leaves no new file.
 
 #include "expect_result.h"
 #include "service_test.h"
@@ -29,7 +29,7 @@ constexpr const char *SERVICE_COMMANDS[] = {
     "renew --cert client.pem --key client.key --out token.xml given.xml",
     "validate given.xml"};
 
-/// The commands that wait for a file that nobody writes.
+/// The commands that wait for a file to which no process writes.
 constexpr const char *FILE_COMMANDS[] = {"inspect fifo", "verify --trust sts.pem fifo",
                                          "verify --trust sts.pem --explain fifo", "verify --trust fifo given.xml"};
 
@@ -44,7 +44,7 @@ protected:
   /// The command line with the service that never answers.
   std::string Stalled(const std::string &command) const { return "ssoclient " + command + " " + Service("stall"); }
 
-  /// Expects that there is no file but those of before, and a cache without a token if the command has one.
+  /// Expects no new file, except an empty cache if the command has one.
   void ExpectNothingLeft(const std::string &command) const {
     std::set<std::string> expected = m_before;
     if (command.find("--cache") != std::string::npos) {
@@ -59,7 +59,7 @@ protected:
 
 class OfServiceCommand : public Ending, public testing::WithParamInterface<std::tuple<const char *, int>> {};
 
-TEST_P(OfServiceCommand, ComesAtASignalWhileTheServiceDoesNotAnswer) {
+TEST_P(OfServiceCommand, IsCausedByASignalWhileTheServiceDoesNotAnswer) {
   const auto [command, signal] = GetParam();
   TerminalSession session(ShellCommand("exec " + Stalled(command)), m_folder.Path());
   AwaitLog("/sts/fault/stall: fault");
@@ -106,7 +106,7 @@ TEST_P(LateFileCommand, EndsAtASignal) {
 
 INSTANTIATE_TEST_SUITE_P(Each, LateFileCommand, testing::ValuesIn(FILE_COMMANDS));
 
-TEST_F(Ending, ComesInTimeAtThePromptAndTheTerminalEchoesAgain) {
+TEST_F(Ending, IsInTimeAtThePromptAndTheTerminalEchoesAgain) {
   for (const char *command : {"acquire ", "token --cache alice.cache "}) {
     TerminalSession session(
         ShellCommand("exec ssoclient " + (command + Service()) + "--user alice@corp.example --timeout 0.5"),
@@ -121,7 +121,7 @@ TEST_F(Ending, ComesInTimeAtThePromptAndTheTerminalEchoesAgain) {
   }
 }
 
-TEST_F(Ending, OfTheDoctorComesInTimeWithWhatItHasFound) {
+TEST_F(Ending, OfTheDoctorIsInTimeAndItReportsWhatItHasFound) {
   const Result result = Run("ssoclient doctor " + Service("stall") + "--timeout 1");
   EXPECT_EQ(4, result.exitCode);
   EXPECT_EQ("", result.err);
@@ -129,11 +129,11 @@ TEST_F(Ending, OfTheDoctorComesInTimeWithWhatItHasFound) {
   EXPECT_THAT(result.out, HasSubstr("\ncertificates  fine      "));
 }
 
-TEST_F(Ending, OfTheDoctorComesInTimeWhileItReadsAFile) {
+TEST_F(Ending, OfTheDoctorIsInTimeWhileItReadsAFile) {
   ExpectResult(Run("ssoclient doctor --sts https://127.0.0.1:9/ --ca fifo --timeout 0.3"), 4, "", LATE);
 }
 
-TEST_F(Ending, DoesNotComeAtASignalThatIsIgnored) {
+TEST_F(Ending, IsNotCausedByASignalThatIsIgnored) {
   TerminalSession session(ShellCommand("trap '' INT; exec ssoclient inspect --timeout 1 fifo"), m_folder.Path());
   session.WaitUntilItBlocks(SIGTERM);
   session.Signal(SIGINT);
@@ -148,7 +148,7 @@ TEST_F(Ending, AtATimeOutOfRangeIsRefused) {
   }
 }
 
-TEST_F(Ending, OfACommandThatIsInTimeIsTheUsualOne) {
+TEST_F(Ending, IsUnchangedForACommandThatNeedsLessTime) {
   for (const char *timeout : {"60", "60.5", "86400"}) {
     ExpectResult(Run("ssoclient validate --timeout " + std::string(timeout) + " " + Service() + "given.xml"), 0,
                  "valid\n", "");

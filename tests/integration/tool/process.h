@@ -23,7 +23,7 @@ struct Result {
 /// since a program inherits which signals its parent ignores: a shell ignores some for background jobs.
 void ResetSignals();
 
-/// Whether the main thread of process `id` leaves `signal` to another thread.
+/// Whether the main thread of process `id` blocks `signal`, so that another thread receives it.
 bool Blocks(pid_t id, int signal);
 
 /// The words that start the tool with `arguments`.
@@ -38,8 +38,8 @@ Result RunTool(const std::vector<std::string> &arguments, const std::string &inp
 /// Runs `ShellCommand(commandLine)` in `folder`.
 Result RunShell(const std::string &commandLine, const std::string &folder = Testing::DataPath("tokens"));
 
-/// Starts the tool with a standard input that stays open and silent, sends it `signal` as soon as it waits for that
-/// signal, and returns how it ended.
+/// Starts the tool with a standard input that stays open and silent, sends it `signal` as soon as the tool waits for
+/// that signal, and returns how the tool ended.
 Result RunToolAndSignal(const std::vector<std::string> &arguments, int signal);
 
 } // namespace ToolTest

@@ -30,7 +30,7 @@ public:
   bool IsStopped() const;
 
   void Signal(int signal);
-  /// Waits until the main thread of the process leaves `signal` to another thread.
+  /// Waits until the main thread of the process blocks `signal`, so that another thread receives it.
   void WaitUntilItBlocks(int signal) const;
   /// Reads the rest of the output. Returns the exit code, or 128 plus the signal that ended the process.
   int Finish();

@@ -75,7 +75,7 @@ TEST_F(Token, IsPrintedAgainWithoutARequest) {
   EXPECT_EQ(0, Run("ssoclient verify --trust sts.pem token.xml").exitCode);
 }
 
-TEST_F(Token, IsInAFileOfItsOwnerThatIsAllThatIsLeft) {
+TEST_F(Token, IsKeptInAFileForItsOwnerOnlyAndNoOtherFileIsLeft) {
   Print("umask 000; " + Line());
   struct stat status = {};
   stat((m_folder / "alice.cache").c_str(), &status);
@@ -117,7 +117,7 @@ TEST_F(Token, IsReplacedOnDemand) {
   EXPECT_EQ(2, CountIssued());
 }
 
-TEST_F(Token, IsAcquiredOnceIfTheCacheIsEmptyAndItIsToBeReplaced) {
+TEST_F(Token, IsAcquiredOnceByARefreshOfAnEmptyCache) {
   Print(Line() + "--refresh");
   EXPECT_EQ(1, CountIssued());
 }
@@ -130,7 +130,7 @@ TEST_F(Token, IsRequestedOnceByManyRunsAtTheSameTime) {
   EXPECT_EQ(1, CountIssued());
 }
 
-TEST_F(Token, IsRequestedOnceByAScriptThatAsksAllTheTime) {
+TEST_F(Token, IsRequestedOnceByAScriptThatAsksRepeatedly) {
   const std::string count = Testing::IS_SANITIZED ? "20" : "200";
   const Result result =
       Run("i=0; while [ $i -lt " + count + " ]; do " + Line() +
@@ -183,7 +183,7 @@ TEST_F(Token, OfATicketNeedsThePrincipal) {
                "ssoclient: usage: with --cache, --gss needs --principal: the cache must know whose token it has\n");
 }
 
-TEST_F(Token, IsNotKeptInALinkOrAFileOfOthers) {
+TEST_F(Token, IsNotKeptInALinkOrAFolderOrAFileThatOthersMayRead) {
   std::filesystem::create_symlink("password.txt", m_folder / "alice.cache");
   ExpectCacheRefused("it is a symbolic link");
   std::filesystem::remove(m_folder / "alice.cache");

@@ -71,7 +71,7 @@ TEST(CancellationSlot, CancelsTheOperationWithAnyTypeOfCancellation) {
   }
 }
 
-TEST(CancellationSlot, LeavesTheTokenOfTheOptionsInForce) {
+TEST(CancellationSlot, DoesNotReplaceTheTokenOfTheOptions) {
   cancellation_signal signal;
   const CancelSource source;
   CallOptions options;

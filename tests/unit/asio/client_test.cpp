@@ -40,7 +40,8 @@ using SsoClient::Asio::AsyncRenew;
 using SsoClient::Asio::AsyncValidate;
 using TokenPtr = std::shared_ptr<const SsoClient::SamlToken>;
 
-/// A service that gives each connection the same answer, and a client of it. An empty answer: it never answers.
+/// A service that sends the same answer on each connection, and a client of it. If the answer is empty, it never
+/// answers.
 class World {
 public:
   explicit World(std::string answer)
@@ -99,7 +100,7 @@ TEST(AsyncAcquire, CallsTheHandlerOnItsExecutor) {
   EXPECT_EQ(called, std::this_thread::get_id());
 }
 
-TEST(AsyncAcquire, GivesAFuture) {
+TEST(AsyncAcquire, ReturnsAFuture) {
   const World world(IssueResponse(BearerXml()));
   std::future<TokenPtr> future = AsyncAcquire(*world.client, ALICE, SpecFor(60), {}, use_future);
   EXPECT_NE(future.get(), nullptr);
@@ -112,7 +113,7 @@ TEST(AsyncAcquire, PassesTheDeadline) {
   EXPECT_THROW(future.get(), SsoClient::DeadlineExceededException);
 }
 
-TEST(AsyncAcquire, GetsAFailureThatIsKnownAtTheStart) {
+TEST(AsyncAcquire, ReportsAFailureThatIsKnownAtTheStart) {
   const World world("");
   std::future<TokenPtr> future =
       AsyncAcquire(*world.client, SsoClient::TokenCredential{nullptr}, SpecFor(60), {}, use_future);
@@ -146,7 +147,7 @@ SsoClient::Credential ProvideAlice() {
   return ALICE;
 }
 
-TEST(AsyncGet, GivesTheTokenOfASource) {
+TEST(AsyncGet, ReturnsTheTokenOfASource) {
   const World world(IssueResponse(BearerXml()));
   const SsoClient::TokenSource source(world.client, ProvideAlice, SpecFor(60));
   io_context context;

@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
-// Contexts that end before the operations whose handlers they would call. AddressSanitizer finds what leaks, and what is used
-// after its end.
+// Contexts that end before the operations whose handlers they would call. AddressSanitizer finds what leaks, and what
+// is used after it is freed.
 #include "manual_operation.h"
 
 #include "support/forked.h"
@@ -57,7 +57,7 @@ TEST(DestroyedContext, DestroysTheHandlerOfAnOperationThatIsUnderWayAndCancelsIt
   EXPECT_EQ(handler.GetCalls(), 0);
 }
 
-TEST(DestroyedContext, IsNotUsedByAnOperationThatEndsLaterWhateverTheExecutor) {
+TEST(DestroyedContext, IsNotUsedThroughAnyExecutorByAnOperationThatEndsLater) {
   const auto check = [](const auto &makeExecutor) {
     auto context = std::make_unique<io_context>();
     ManualOperation operation;

@@ -61,7 +61,7 @@ TEST(Handler, GetsAFailureInItsOwnClass) {
   EXPECT_THROWS_MESSAGE(std::rethrow_exception(calls.failure), InvalidCredentialsException, "wrong password");
 }
 
-TEST(Handler, GivesItsContextWorkUntilItIsCalled) {
+TEST(Handler, KeepsItsContextRunningUntilItIsCalled) {
   io_context context;
   ManualOperation operation;
   HandlerCalls calls;
@@ -120,7 +120,7 @@ TEST(Handler, GetsWhatTheStartOfTheOperationThrows) {
   EXPECT_THROW(std::rethrow_exception(calls.failure), std::bad_alloc);
 }
 
-TEST(Handler, CanBeMovedOnly) {
+TEST(Handler, MayBeMoveOnly) {
   io_context context;
   ManualOperation operation;
   int value = 0;
@@ -200,7 +200,7 @@ struct AllocatingHandler {
   int *liveDuringCall;
 };
 
-TEST(Handler, GivesItsAllocatorToItsExecutorAndGetsAllMemoryBackBeforeTheCall) {
+TEST(Handler, PassesItsAllocatorToItsExecutorAndAllMemoryIsFreedBeforeTheCall) {
   io_context context;
   ManualOperation operation;
   int live = 0;
@@ -214,7 +214,7 @@ TEST(Handler, GivesItsAllocatorToItsExecutorAndGetsAllMemoryBackBeforeTheCall) {
   EXPECT_EQ(live, 0);
 }
 
-TEST(UseFuture, GivesTheResult) {
+TEST(UseFuture, ReturnsTheResult) {
   ManualOperation operation;
   std::future<bool> future = operation.Run(boost::asio::use_future);
   operation.End(true);

@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// `ManualOperation`, an operation that ends when the test wants it to.
+/// `ManualOperation`, an operation that ends when the test calls `End`.
 
 #pragma once
 
@@ -16,7 +16,7 @@ namespace Testing {
 
 class ManualOperation {
 public:
-  /// Starts the operation with a completion token, as the functions of the component do.
+  /// Starts the operation with a completion token, like the functions of the component.
   template <typename CompletionToken>
   auto Run(CompletionToken &&token, SsoClient::CallOptions options = {}) {
     return SsoClient::Asio::Detail::Initiate<bool>(
@@ -40,7 +40,7 @@ private:
   SsoClient::ValidityCallback m_callback;
 };
 
-/// What a handler was called with.
+/// How often a handler was called, and the arguments of its last call.
 class HandlerCalls {
 public:
   auto MakeHandler() {

@@ -42,12 +42,12 @@ inline boost::optional<Reply> Issue(const SsoClient::Request &, int) {
   return Success("issued:" + BearerXml());
 }
 
-/// Holds each request.
+/// Leaves each request unanswered.
 inline boost::optional<Reply> Hold(const SsoClient::Request &, int) {
   return boost::none;
 }
 
-/// What a client on stand-ins is made of.
+/// The parts of a client that a test can replace.
 struct ClientParts {
   SsoClient::ClientOptions options{};
   std::function<void()> onCompose = [] {};

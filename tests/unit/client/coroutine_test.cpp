@@ -73,7 +73,7 @@ EagerTask Await(Awaitable<Value> awaitable, Results &results) {
   results.Add(std::move(text));
 }
 
-/// A transport that answers as its first parameter says, a client on it, and what became of its coroutines.
+/// A scripted transport, a client on it, and what became of its coroutines.
 struct World {
   explicit World(ScriptedTransport::Script script)
       : transport(std::make_shared<ScriptedTransport>(std::move(script))), client(ClientOn(transport)) {}
@@ -83,7 +83,7 @@ struct World {
   Results results;
 };
 
-TEST(AwaitableOfTheClient, GivesTheResultOfEachOperation) {
+TEST(AwaitableOfTheClient, ReturnsTheResultOfEachOperation) {
   World world([](const Request &request, int) -> boost::optional<Testing::Reply> {
     return Testing::Success(request.body.rfind("Validate", 0) == 0 ? "valid:true"
                             : request.body.rfind("Renew", 0) == 0  ? "renewed:" + Testing::BearerXml()
@@ -201,7 +201,7 @@ TEST(AwaitableOfTheClient, WorksWithinOtherCoroutines) {
   task.WaitUntilDone();
 }
 
-TEST(AwaitableOfTheClient, ServesManyCoroutinesOfWhichSomeAreDestroyed) {
+TEST(AwaitableOfTheClient, ServesManyCoroutinesEvenIfSomeAreDestroyed) {
   constexpr int COUNT = 300;
   World world(Testing::Hold);
   std::vector<std::unique_ptr<EagerTask>> tasks;

@@ -1,5 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
-// An operation is cancelled, late, or without its client, at each of its steps.
+// At each of its steps, an operation is cancelled, or its deadline passes, or its client is destroyed.
 #include "client_setup.h"
 #include "stepped_time.h"
 #include "support/recorded_events.h"
@@ -70,7 +70,7 @@ std::vector<DecisionCase> Cases() {
           {"DestroyedDuringTheFinalLeg", Stage::FINAL_LEG, Cause::DESTROY}};
 }
 
-/// Stops at the gate in one leg.
+/// Waits at the gate in its final leg, or in its first one.
 class StoppingHandler final : public NegotiationHandler {
 public:
   StoppingHandler(std::shared_ptr<Gate> gate, bool isFinal) : m_gate(std::move(gate)), m_isFinal(isFinal) {}
@@ -205,7 +205,7 @@ TEST_P(Decision, CancelsARequestThatIsUnderWay) {
 INSTANTIATE_TEST_SUITE_P(At, Decision, testing::ValuesIn(Cases()),
                          [](const auto &tested) { return std::string(tested.param.name); });
 
-/// A client whose requests are held.
+/// A client whose requests are not answered before the test answers them.
 class HeldClient : public testing::Test {
 protected:
   HeldClient() {
@@ -283,7 +283,7 @@ TEST_F(HeldClient, EndsACallThatWaitsDuringALegOfItsHandler) {
   gate->Open();
 }
 
-TEST_F(HeldClient, EndsAMessageAfterFourMinutesWithTheTextOfTheService) {
+TEST_F(HeldClient, EndsARequestAfterFourMinutesLikeSecurityTokenService) {
   client->AcquireAsync(Alice(), SpecFor(60), options, outcomes.Record());
   transport->WaitForSent(1);
   time.Advance(std::chrono::minutes(4) - milliseconds(1));
@@ -294,7 +294,7 @@ TEST_F(HeldClient, EndsAMessageAfterFourMinutesWithTheTextOfTheService) {
   EXPECT_EQ(transport->CountCancelled(), 0);
 }
 
-TEST_F(HeldClient, LimitsAMessageToFourMinutesWhenTheDeadlineIsLater) {
+TEST_F(HeldClient, LimitsARequestToFourMinutesWhenTheDeadlineIsLater) {
   options.deadline = time.GetSteadyTime() + std::chrono::hours(1);
   client->AcquireAsync(Alice(), SpecFor(60), options, outcomes.Record());
   transport->WaitForSent(1);
@@ -341,7 +341,7 @@ TEST_F(HeldClient, ReleasesCredentialAndSpecWhenTheRequestHasBeenComposed) {
   EXPECT_EQ(outcomes.Get(), Strings());
 }
 
-TEST_F(HeldClient, KeepsTheCredentialForFurtherAttemptsUntilItIsDecided) {
+TEST_F(HeldClient, KeepsTheCredentialForFurtherAttemptsUntilTheOperationEnds) {
   auto token = Testing::HolderToken();
   const std::weak_ptr<const SamlToken> released = token;
   options.retryPolicy = RetryPolicy();

@@ -215,7 +215,7 @@ TEST(TokenClient, NegotiatesManyLegsInOneSession) {
   EXPECT_EQ(handler->received, (Strings{"", "s1", "s2", "final"}));
 }
 
-TEST(TokenClient, RefusesWhatMayNotBeNull) {
+TEST(TokenClient, RefusesNullArguments) {
   const auto transport = std::make_shared<ScriptedTransport>(Testing::Issue);
   const auto client = ClientOn(transport);
   const char *const refused = "InvalidArgumentException: Invalid argument : a required object may not be NULL";
@@ -253,7 +253,7 @@ TEST(TokenClient, FailsWhenTheServiceReturnsAnEmptyTextInsteadOfAToken) {
   EXPECT_EQ(EndOf([&] { ClientOn(Answering({"renewed:"}))->Renew(Testing::HolderToken(), 60); }), empty);
 }
 
-TEST(TokenClient, FailsInTheClassesOfTheService) {
+TEST(TokenClient, FailsLikeSecurityTokenService) {
   const std::string expired = Testing::ReadDataFile("tokens/expired.xml");
   const auto transport = Answering({"fault:wrong password", "issued:" + expired, "nonsense"});
   const auto client = ClientOn(transport);
@@ -267,7 +267,7 @@ TEST(TokenClient, FailsInTheClassesOfTheService) {
   }
 }
 
-TEST(TokenClient, PassesOnWhateverAHandlerThrows) {
+TEST(TokenClient, PassesOnWhatAHandlerThrows) {
   const auto client = ClientOn(std::make_shared<ScriptedTransport>(Testing::Issue));
   const NegotiationCredential noMemory{[]() -> std::shared_ptr<NegotiationHandler> { throw std::bad_alloc(); }};
   const NegotiationCredential foreign{[]() -> std::shared_ptr<NegotiationHandler> { throw 7; }};
@@ -327,7 +327,7 @@ TEST(TokenClient, RunsCallbacksOnTheExecutorOfTheCallOrOfTheClient) {
   EXPECT_EQ(*ofCall, 1);
 }
 
-TEST(TokenClient, LogsWhatACallbackThrowsAndGoesOn) {
+TEST(TokenClient, LogsWhatACallbackThrowsAndContinues) {
   const Testing::ScopedLogLevel level(LOG_LEVEL_CONTRACT_WARNING);
   const Testing::RecordedLog log;
   const auto client = ClientOn(std::make_shared<ScriptedTransport>(Testing::Issue));
@@ -337,7 +337,7 @@ TEST(TokenClient, LogsWhatACallbackThrowsAndGoesOn) {
   EXPECT_EQ(client->Acquire(Alice(), SpecFor(60))->GetSubject().ToString(), SUBJECT);
 }
 
-TEST(CallOptions, HasADeadlineForEveryTime) {
+TEST(CallOptions, HasADeadlineForEveryTimeout) {
   const auto deadlineAfter = [](std::chrono::milliseconds time) { return *CallOptions::WithTimeout(time).deadline; };
   const auto now = CallOptions::Clock::now();
   EXPECT_LT(deadlineAfter(std::chrono::milliseconds::min()), now);

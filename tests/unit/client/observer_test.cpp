@@ -1,5 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
-// What observer, log and sink of refused tokens get from the operations of a client.
+// What the observer, the log and the sink of refused tokens receive from the operations of a client.
 #include "client_setup.h"
 #include "support/identity.h"
 #include "support/recorded_events.h"
@@ -83,7 +83,7 @@ Strings Trace(const std::function<void(const std::shared_ptr<RecordedEvents> &)>
         line.erase(at, std::string(own).size());
       }
     }
-    // Only the document's interface writes these two lines.
+    // Only `SecurityTokenService` writes these two lines.
     if (line.find("AcquireToken sending") == std::string::npos &&
         line.find("AcquireToken processing") == std::string::npos) {
       trace.push_back(line);
@@ -94,7 +94,7 @@ Strings Trace(const std::function<void(const std::shared_ptr<RecordedEvents> &)>
 
 class ObservedClient : public testing::TestWithParam<Testing::ObservedOperation> {
 protected:
-  /// Compares the service and the client when each request is answered with `answer`.
+  /// Compares `SecurityTokenService` and the client when each request is answered with `answer`.
   static void ExpectTheSame(const std::string &answer) {
     const Strings ofService = Trace([&](const std::shared_ptr<RecordedEvents> &observer) {
       ServiceOptions options;
@@ -113,7 +113,7 @@ protected:
   }
 };
 
-TEST_P(ObservedClient, ReportsLogsAndReturnsWhatTheServiceDoes) {
+TEST_P(ObservedClient, ReportsLogsAndReturnsTheSameAsTheService) {
   ExpectTheSame(GetParam().respond(Testing::BearerXml()));
 }
 
@@ -147,7 +147,7 @@ TEST(ObservedOperation, IsReportedToTheObserverOfTheCall) {
             (Strings{"started AcquireToken", "sent urn:action", "received 200 OK, text/xml", "ended"}));
 }
 
-/// Cancels its operation in one of its events.
+/// Cancels its operation before the request is sent.
 class CancellingObserver final : public OperationObserver {
 public:
   explicit CancellingObserver(CancelSource source) : m_source(std::move(source)) {}
@@ -176,7 +176,7 @@ TEST(ObservedOperation, MayBeCancelledByItsObserverBeforeItIsSent) {
   EXPECT_EQ(observer->end, "The operation was cancelled");
 }
 
-/// Stops in an event, and records the events from there.
+/// Waits at the gate in the event of a response, and records that event and later ones.
 class StoppingObserver final : public OperationObserver {
 public:
   void OnResponseReceived(const OperationInfo &, const ResponseReceivedEvent &) override {
@@ -249,7 +249,7 @@ TEST(EndOfEvents, IsReportedByTheThreadThatReportsAnEvent) {
   EXPECT_EQ(listener.calls, 1);
 }
 
-TEST(EndOfEvents, IsReportedAtOnceWhenNoEventIsReported) {
+TEST(EndOfEvents, IsReportedAtOnceWhenNoEventIsBeingReported) {
   StoppingObserver observer;
   observer.gate.Open();
   const std::string id;
@@ -310,7 +310,7 @@ TEST(PerCallOptions, UseTheirOwnDialectAndVerifyOptions) {
   EXPECT_EQ(bodies->at(1).find("urn:other"), std::string::npos);
 }
 
-TEST(PerCallOptions, AreRefusedAsTheOutcome) {
+TEST(PerCallOptions, AreRefusedInTheOutcome) {
   const auto client = Testing::ClientOn(std::make_shared<ScriptedTransport>(Testing::Issue));
   CallOptions options;
   options.verifyOptions = VerifyOptions();

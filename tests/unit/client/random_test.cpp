@@ -1,5 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
-// Many operations that end at random moments: each has exactly one outcome, and nothing is left of it.
+// Many operations that end at random moments: each has exactly one outcome, and leaves nothing in memory.
 #include "client_setup.h"
 #include "support/recorded_events.h"
 #include "support/sanitized.h"
@@ -25,7 +25,7 @@ using Testing::ScriptedTransport;
 constexpr int OPERATIONS = Testing::IS_SANITIZED ? 2000 : 20000;
 constexpr int THREADS = 4;
 
-/// Counts the starts and the ends that an observer sees, and events after the end.
+/// Counts the starts and the ends of operations.
 class CountingObserver final : public OperationObserver {
 public:
   void OnStarted(const OperationInfo &) override { ++started; }
@@ -35,7 +35,7 @@ public:
   std::atomic<int> ended{0};
 };
 
-/// The outcome of each operation: how often its callback was called.
+/// How often the callback of an operation was called.
 struct Calls {
   std::atomic<int> outcomes{0};
 };

@@ -156,7 +156,7 @@ protected:
 
 constexpr const char *SUBJECT = "{Name: alice; Domain:corp.example}";
 
-TEST_F(RetryingClient, RepeatsWhatWasNotSentInANewSession) {
+TEST_F(RetryingClient, RepeatsTheRequestAfterItsDelayInANewSession) {
   Start({NoConnection(), Unavailable("1")}, 3);
   transport->WaitForSent(1);
   EXPECT_TRUE(Testing::Eventually([&] { return time.CountTimers() == 1 && transport->CountOpenSessions() == 0; }));

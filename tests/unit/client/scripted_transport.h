@@ -21,21 +21,22 @@ namespace Testing {
 /// The answer to a request. With a failure there is no response.
 struct Reply {
   std::string body;
-  std::string failure{}; ///< the text of a `CommunicationException`; empty for none
+  std::string failure{}; ///< the text of a `CommunicationException`; empty if there is none
   SsoClient::ResponseFacts facts{200, "OK", "text/xml", 0, "", true};
 };
 
-/// A response with that body.
+/// A response with this body.
 Reply Success(const std::string &body);
-/// No connection was made.
+/// A failure to connect.
 Reply NoConnection();
-/// The status 503 with that value of Retry-After.
+/// The status 503 with this value of Retry-After.
 Reply Unavailable(const std::string &retryAfter);
 
 /// Safe on any thread. Completions run on the platform's I/O threads.
 class ScriptedTransport final : public SsoClient::Transport {
 public:
-  /// The answer to a request; `boost::none` to hold it until the test answers or the client cancels it. May throw.
+  /// Returns the answer to a request. With `boost::none`, the request waits until the test answers or the client cancels.
+  /// May throw.
   using Script = std::function<boost::optional<Reply>(const SsoClient::Request &request, int number)>;
 
   explicit ScriptedTransport(Script script);
@@ -45,14 +46,14 @@ public:
 
   std::shared_ptr<SsoClient::TransportSession> CreateSession() const override;
 
-  /// Answers all requests that are held.
+  /// Answers all requests that wait.
   void AnswerHeld(const Reply &reply) const;
 
   /// The bodies of the requests, each after the number of its session: "1: UserPass …".
   std::vector<std::string> Sent() const;
   /// Waits until that many requests have been sent.
   bool WaitForSent(int count) const;
-  /// How many requests were cancelled, and how many ended by the limit for a message.
+  /// How many requests were cancelled, and how many ended at their time limit.
   int CountCancelled() const;
   int CountTimedOut() const;
   /// How many sessions have not been released.

@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// `SteppedTime`, clocks and timers that move only when a test says so.
+/// `SteppedTime`, clocks and timers that move only when a test calls `Advance`.
 
 #pragma once
 

@@ -36,7 +36,7 @@ using Testing::LazyTask;
 
 static_assert(!std::is_copy_constructible_v<Awaitable<bool>> && !std::is_move_assignable_v<Awaitable<bool>>);
 
-/// An operation that ends when the test wants it to.
+/// An operation that ends when the test calls `End`.
 class Operation {
 public:
   Awaitable<bool> Run() {
@@ -48,7 +48,7 @@ public:
   }
 
   void End(const Outcome<bool> &outcome) { std::exchange(m_callback, nullptr)(outcome); }
-  /// The engine calls each callback once, also that of an operation that was cancelled.
+  /// Returns the callback, which the engine calls once even if the operation was cancelled.
   Awaitable<bool>::Callback TakeCallback() { return std::exchange(m_callback, nullptr); }
 
   int starts = 0;
@@ -132,7 +132,7 @@ TEST(Awaitable, CancelsTheOperationWhenTheCoroutineThatWaitsIsDestroyed) {
   EXPECT_EQ(results, std::vector<std::string>());
 }
 
-TEST(Awaitable, IsDestroyedWhileItsOperationEndsWithinTheCancelling) {
+TEST(Awaitable, CanBeDestroyedIfTheCancelEndsItsOperationAtOnce) {
   Operation operation;
   CancelRegistration registration;
   std::vector<std::string> results;

@@ -53,7 +53,7 @@ TEST(CancelToken, IsCancelledByItsSource) {
   EXPECT_TRUE(source.GetToken().IsCancelled());
 }
 
-TEST(CancelToken, RemainsWhatItIsWhenItsSourceIsDestroyed) {
+TEST(CancelToken, KeepsItsStateWhenItsSourceIsDestroyed) {
   auto source = std::make_unique<CancelSource>();
   const CancelToken token = source->GetToken();
   source->Cancel();
@@ -195,7 +195,7 @@ TEST(OnCancel, DoesNotWaitForAFunctionThatRuns) {
 }
 
 TEST(OnCancel, TakesAsLongForOneOfManyFunctionsAsForOneOfFew) {
-  // With a search through all functions, a million would take hours.
+  // With a search through all functions, the test would not end in time.
   constexpr int COUNT = Testing::IS_SANITIZED ? 50'000 : 500'000;
   const CancelSource source;
   int calls = 0;
@@ -240,7 +240,7 @@ struct Race {
   EventCount cancelled;
 };
 
-TEST(OnCancel, CallsEachFunctionOnceWhateverOtherThreadsDo) {
+TEST(OnCancel, CallsEachFunctionOnceWhileOtherThreadsRegisterAndRemove) {
   for (int round = 0; round < (Testing::IS_SANITIZED ? 20 : 200); ++round) {
     Race race;
     std::vector<std::thread> threads;
@@ -291,7 +291,7 @@ TEST(AnyOf, IsTheOtherTokenWhenOneCannotBeCancelled) {
   EXPECT_TRUE(right.IsCancelled());
 }
 
-TEST(AnyOf, IsHeldByARegistration) {
+TEST(AnyOf, IsKeptAliveByARegistration) {
   const CancelSource first;
   const CancelSource second;
   int calls = 0;

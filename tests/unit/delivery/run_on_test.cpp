@@ -40,7 +40,7 @@ public:
     };
   }
 
-  /// Whether the function has run once, and what it captures is released.
+  /// Waits, and returns whether the function has run exactly once and what it captures is released.
   bool HasRunOnce() {
     return m_ran.WaitFor(1) && Eventually([this] { return m_held.use_count() == 1; }) && m_runs == 1;
   }
@@ -171,7 +171,7 @@ TEST(RunOn, LetsAFunctionRunAnother) {
   EXPECT_TRUE(inner.HasRunElsewhere());
 }
 
-TEST(RunOn, RunsEachFunctionOnceWhateverTheExecutorsDo) {
+TEST(RunOn, RunsEachFunctionOnceEvenIfExecutorsQueueOrDropItOrThrow) {
   constexpr int COUNT = Testing::IS_SANITIZED ? 2'000 : 20'000;
   const RecordedLog log;
   std::vector<std::atomic<int>> runs(COUNT);

@@ -49,7 +49,7 @@ TEST(CancelTokenOfAStopToken, CannotBeCancelledWithoutAStopSource) {
   EXPECT_FALSE(CancelToken(orphan).CanBeCancelled());
 }
 
-TEST(CancelTokenOfAStopToken, IsHeldByARegistration) {
+TEST(CancelTokenOfAStopToken, IsKeptAliveByARegistration) {
   std::stop_source source;
   int calls = 0;
   const CancelRegistration registration = CancelToken(source.get_token()).OnCancel([&calls] { ++calls; });

@@ -24,7 +24,7 @@ using Testing::EventCount;
 
 const System::NetworkException REFUSED("refused");
 
-/// Ends the connect when the test says so.
+/// Ends the connect when the test decides.
 class HeldSpec final : public OneStreamSpec {
 public:
   using OneStreamSpec::OneStreamSpec;
@@ -49,7 +49,7 @@ private:
   mutable ConnectCompletion m_completion;
 };
 
-/// Breaks at the first read.
+/// Breaks at the first read or write.
 class BreakingStream final : public System::Stream {
 public:
   void AsyncReadSome(char *, std::size_t, TransferHandler handler) override {
@@ -63,7 +63,7 @@ public:
 
 class HasConnected : public UserAgentTest {
 protected:
-  /// Starts a request, lets `step` end or cancel it, and returns what its completion function reads.
+  /// Starts a request, lets `step` end or cancel it, and returns what `HasConnected` reports in the completion.
   bool ReadAfter(const std::function<void()> &step) {
     bool hasConnected = false;
     EventCount ended;
@@ -109,7 +109,7 @@ TEST_F(HasConnected, IsFalseWhenTheConnectSucceedsOnlyAfterTheRequestWasCancelle
   }));
 }
 
-TEST_F(HasConnected, IsTrueWhenTheConnectionBreaksAfterTheRequest) {
+TEST_F(HasConnected, IsTrueWhenTheConnectionBreaks) {
   EXPECT_TRUE(ReadAfter([this] { m_spec->End(m_stream, nullptr); }));
 }
 

@@ -60,7 +60,7 @@ TEST(Timer, CallsAFunctionWhoseTimeHasPassedSoonButOnAnotherThread) {
   EXPECT_NE(thread.load(), std::this_thread::get_id());
 }
 
-TEST(Timer, CallsInTheOrderOfTheTimesWhateverTheOrderOfTheStarts) {
+TEST(Timer, CallsInTheOrderOfTheTimesNotOfTheStarts) {
   const auto begin = Clock::now() + std::chrono::milliseconds(20);
   std::mutex mutex;
   std::vector<int> order;
@@ -109,7 +109,7 @@ TEST(Timer, IsDoneAtOnceWhenCancelledAndReleasesWhatItsFunctionCaptures) {
   EXPECT_EQ(calls, 0);
 }
 
-TEST(Timer, IsDoneOnlyAfterItsFunctionAndWhatItCaptures) {
+TEST(Timer, IsDoneOnlyWhenItsFunctionHasEndedAndIsReleased) {
   const auto gate = std::make_shared<Gate>();
   auto captured = std::make_shared<int>();
   const std::weak_ptr<int> watched = captured;
@@ -141,7 +141,7 @@ TEST(Timer, MayBeStartedAndCancelledByTheFunctionOfAnother) {
   EXPECT_TRUE(other->IsDone());
 }
 
-TEST(Timer, PreventsTheCallOfATimerThatIsDueAtTheSameTime) {
+TEST(Timer, CanPreventTheCallOfATimerThatIsDueAtTheSameTime) {
   const Testing::RecordedLog log;
   // A blocked function keeps the next two waiting until both are due.
   Gate gate;

@@ -31,12 +31,12 @@ inline mode_t ModeOf(const std::string &path) {
   return status.st_mode & 07777;
 }
 
-/// A folder with one private file in it, "cache". Each test checks that it leaves no descriptor open.
+/// An empty folder, and `PrivateFile` for the path "cache" in it. Each test checks that it leaves no descriptor open.
 class PrivateFileFixture : public ::testing::Test {
 protected:
   ~PrivateFileFixture() override { EXPECT_EQ(CountDescriptors(), m_descriptors); }
 
-  /// Both ways to open the file are refused.
+  /// Expects that both ways to open the file are refused.
   void ExpectRefusal(const std::string &reason) const {
     const std::string message = "Cannot use " + m_path + ": " + reason;
     EXPECT_THROWS_MESSAGE(m_file.Read(), Tarvel::IOException, message);
@@ -45,7 +45,7 @@ protected:
 
   void WritePrivately(const std::string &content) const { m_file.TryLock()->Replace(content); }
 
-  /// Expects that the content cannot be replaced, that the old one stays, and that the lock is still held.
+  /// Expects that the content cannot be replaced, that the old content stays, and that the file is still locked.
   void ExpectOldContentAfter(SystemFaults &faults, const std::string &message) const {
     WritePrivately("old");
     const auto lock = m_file.TryLock();

@@ -31,7 +31,7 @@ struct Counts {
 
 constexpr std::size_t LENGTH_STEP = 9001;
 
-/// Contents of different lengths, each of one letter that decides its length.
+/// Contents of different lengths. Each repeats one letter, which determines the length.
 std::string ContentOf(int number) {
   return std::string(LENGTH_STEP * static_cast<std::size_t>(number % 8 + 1), static_cast<char>('a' + number % 8));
 }

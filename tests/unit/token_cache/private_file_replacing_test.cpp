@@ -26,7 +26,7 @@ using Tarvel::PrivateFile;
 
 using PrivateFileReplacing = PrivateFileFixture;
 
-TEST_F(PrivateFileReplacing, IsReadAndWrittenWhenEachCallOfTheSystemIsInterrupted) {
+TEST_F(PrivateFileReplacing, IsReadAndWrittenWhenEachSystemCallIsInterrupted) {
   SystemFaults faults;
   faults.interruptsOften = true;
   faults.largestWrite = 1000;
@@ -39,7 +39,7 @@ TEST_F(PrivateFileReplacing, IsReadAndWrittenWhenEachCallOfTheSystemIsInterrupte
   EXPECT_EQ(m_file.Read(), std::string());
 }
 
-TEST_F(PrivateFileReplacing, SynchronisesTheFileBeforeAndTheFolderAfterItHasItsName) {
+TEST_F(PrivateFileReplacing, SynchronisesTheFileBeforeItIsRenamedAndTheFolderAfterwards) {
   const auto lock = m_file.TryLock();
   SystemFaults faults;
   faults.beforeRename = [&faults] {
@@ -77,7 +77,7 @@ TEST_F(PrivateFileReplacing, KeepsItsContentWhenTheNewFileCannotBeLocked) {
   ExpectOldContentAfter(faults, "Cannot lock " + m_path + ".new: No locks available");
 }
 
-TEST_F(PrivateFileReplacing, KeepsItsContentBeyondTheLimitOfTheProcessForFiles) {
+TEST_F(PrivateFileReplacing, KeepsItsContentWhenTheNewFileExceedsTheLimitOfTheProcess) {
   WritePrivately("old");
   EXPECT_EQ(RunInChild([&] {
               std::signal(SIGXFSZ, SIG_IGN);
@@ -99,7 +99,7 @@ TEST_F(PrivateFileReplacing, ReportsAReadThatFails) {
   EXPECT_THROWS_MESSAGE(m_file.Read(), IOException, "Cannot read " + m_path + ": Input/output error");
 }
 
-TEST_F(PrivateFileReplacing, ReportsALockThatCannotBeTaken) {
+TEST_F(PrivateFileReplacing, ReportsThatItCannotBeLocked) {
   SystemFaults faults;
   faults.lockError = ENOLCK;
   const ScopedFaults scope(faults);
@@ -136,7 +136,7 @@ TEST_F(PrivateFileReplacing, ReportsAFolderInPlaceOfTheNewFile) {
   EXPECT_THROWS_MESSAGE(WritePrivately("content"), IOException, "Cannot replace " + m_path + ".new: Is a directory");
 }
 
-TEST_F(PrivateFileReplacing, HasOneHolderOfItsLockAlsoInOneProcess) {
+TEST_F(PrivateFileReplacing, HasOneHolderOfItsLockEvenWithinOneProcess) {
   auto lock = m_file.TryLock();
   EXPECT_EQ(PrivateFile(m_path).TryLock(), nullptr);
   lock.reset();
@@ -164,7 +164,7 @@ TEST_F(PrivateFileReplacing, IsLockedBeforeTheNewFileHasItsName) {
   EXPECT_EQ(faults.beforeRename, nullptr);
 }
 
-TEST_F(PrivateFileReplacing, IsLockedAndNotTheFileThatItReplacedInTheMeantime) {
+TEST_F(PrivateFileReplacing, IsLockedInsteadOfTheFileThatItHasReplaced) {
   WritePrivately("old");
   m_folder.Write("other", "new");
   ASSERT_EQ(::chmod((m_folder / "other").c_str(), 0600), 0);

@@ -23,13 +23,13 @@ using Tarvel::PrivateFile;
 
 using PrivateFileTest = PrivateFileFixture;
 
-TEST_F(PrivateFileTest, RefusesAPathThatTheSystemWouldCut) {
+TEST_F(PrivateFileTest, RefusesAPathThatIsEmptyOrContainsANul) {
   const char message[] = "Invalid argument : the path of a private file is empty or contains a NUL";
   EXPECT_THROWS_MESSAGE(PrivateFile(""), Tarvel::InvalidArgumentException, message);
   EXPECT_THROWS_MESSAGE(PrivateFile(m_path + '\0' + "x"), Tarvel::InvalidArgumentException, message);
 }
 
-TEST_F(PrivateFileTest, HasNoContentIfThereIsNoFileAndMakesNone) {
+TEST_F(PrivateFileTest, HasNoContentIfItDoesNotExistAndIsNotMadeByARead) {
   EXPECT_EQ(m_file.Read(), boost::none);
   EXPECT_EQ(m_folder.Names(), Names{});
 }
@@ -63,7 +63,7 @@ TEST_F(PrivateFileTest, HasExactlyTheContentThatWasWritten) {
   }
 }
 
-TEST_F(PrivateFileTest, MayHaveThirtyTwoMebibytesAndNotMore) {
+TEST_F(PrivateFileTest, MayHaveAtMostThirtyTwoMebibytes) {
   const std::string largest(PrivateFile::MAX_BYTES, 'x');
   WritePrivately(largest);
   EXPECT_EQ(m_file.Read(), largest);
@@ -161,7 +161,7 @@ TEST_F(PrivateFileTest, NeedsPermissionForItsFolder) {
   ASSERT_EQ(::mkdir((m_folder / "closed").c_str(), 0), 0);
   const PrivateFile file(m_folder / "closed/cache");
   EXPECT_EQ(RunInChild([&] {
-              if (::geteuid() == 0) { // permissions do not hold for root
+              if (::geteuid() == 0) { // root ignores permissions
                 ASSERT_EQ(::chmod(m_folder.Path().c_str(), 0755), 0);
                 ASSERT_EQ(::seteuid(65534), 0);
               }

@@ -17,7 +17,7 @@ namespace Testing {
 
 namespace {
 
-SystemFaults *g_faults = nullptr; // not owned; null for none
+SystemFaults *g_faults = nullptr; // not owned; null without faults
 unsigned g_calls = 0;
 
 int Fail(int error) {
@@ -25,7 +25,7 @@ int Fail(int error) {
   return -1;
 }
 
-/// The error of this call; 0 for none.
+/// The error of this call; 0 if it does not fail.
 int ErrorOf(int SystemFaults::*error) {
   if (!g_faults) {
     return 0;

@@ -10,11 +10,11 @@
 
 namespace Testing {
 
-/// What the functions do. The errors are values of `errno`; 0 for none.
+/// How the functions behave. An error is a value of `errno`; with 0 the function does not fail.
 struct SystemFaults {
   bool interruptsOften = false;                                       ///< every second call fails with EINTR
-  std::size_t largestWrite = std::numeric_limits<std::size_t>::max(); ///< of one call
-  std::size_t space = std::numeric_limits<std::size_t>::max();        ///< then `write` fails with ENOSPC
+  std::size_t largestWrite = std::numeric_limits<std::size_t>::max(); ///< in bytes, by one call
+  std::size_t space = std::numeric_limits<std::size_t>::max();        ///< in bytes; then `write` fails with ENOSPC
   int readError = 0;
   int lockError = 0;
   int synchronisationError = 0;
@@ -23,10 +23,10 @@ struct SystemFaults {
   bool dropsModes = false;                    ///< `fchmod` fails with EPERM
   bool skipsSynchronisation = false;          ///< `fsync` does nothing, and succeeds
   bool isOtherUser = false;                   ///< the process seems to have another effective user
-  std::function<void()> beforeLock = nullptr; ///< called once, before the next lock is taken
+  std::function<void()> beforeLock = nullptr; ///< called once, before the next lock
   std::function<void()> beforeRename = nullptr;
 
-  int synchronisedFiles = 0; ///< counted
+  int synchronisedFiles = 0; ///< how many `fsync` has synchronised
   int synchronisedFolders = 0;
 };
 

@@ -52,7 +52,7 @@ CacheBinding RichBinding() {
   return binding;
 }
 
-/// The time is that at which the tokens of the fixtures are valid, unless a test changes it.
+/// The tokens in the test data are valid at the time of the clock, unless a test changes it.
 class TokenCacheFileTest : public ::testing::Test {
 protected:
   static std::shared_ptr<const SamlToken> Verify(const std::string &xml) {
@@ -163,7 +163,7 @@ TEST_F(TokenCacheFileTest, DistinguishesAdviceOfTheSameWords) {
   EXPECT_EQ(FileFor(second).Read(), nullptr);
 }
 
-TEST_F(TokenCacheFileTest, HasNoTokenIfAnyOfItsEndIsMissing) {
+TEST_F(TokenCacheFileTest, HasNoTokenIfItsEndIsMissing) {
   const TokenCacheFile file = FileFor(Binding());
   Write(file, *Token("bearer-minimal"));
   const std::string whole = Text();
@@ -245,12 +245,12 @@ TEST_F(TokenCacheFileTest, HasNoTokenThatIsNotXml) {
   EXPECT_EQ(file.Read(), nullptr);
 }
 
-TEST_F(TokenCacheFileTest, HasNoTokenIfNoneIsMadeOfItsText) {
+TEST_F(TokenCacheFileTest, HasNoTokenIfItsVerificationReturnsNull) {
   Write(FileFor(Binding()), *Token());
   EXPECT_EQ(TokenCacheFile(m_path, Binding(), [](const std::string &) { return nullptr; }).Read(), nullptr);
 }
 
-TEST_F(TokenCacheFileTest, PassesOnWhatIsNoRefusalOfTheToken) {
+TEST_F(TokenCacheFileTest, PassesOnErrorsThatAreNotRefusalsOfTheToken) {
   Write(FileFor(Binding()), *Token());
   const TokenCacheFile file(m_path, Binding(),
                             [](const std::string &) -> std::shared_ptr<const SamlToken> { throw std::bad_alloc(); });
@@ -274,7 +274,7 @@ TEST_F(TokenCacheFileTest, RemovesOnlyTheTokenWithTheIdentifier) {
   EXPECT_NE(file.Read(), nullptr);
 }
 
-TEST_F(TokenCacheFileTest, LeavesAFileThatIsRefusedAsItIs) {
+TEST_F(TokenCacheFileTest, DoesNotChangeAFileThatIsRefused) {
   const TokenCacheFile file = FileFor(Binding());
   Write(file, *Token());
   const std::string text = Text();

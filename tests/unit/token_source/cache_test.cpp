@@ -23,7 +23,7 @@ using testing::StartsWith;
 
 namespace {
 
-/// Each stage is a program of its own that uses the same file.
+/// Each stage represents a program, and both use the same file.
 class CachedSource : public testing::Test {
 protected:
   CachedSource() : m_path(m_folder / "token") {
@@ -209,7 +209,7 @@ TEST_F(CachedSource, ReturnsATokenWhoseWritingTakesTooLong) {
   m_first.blocking = [&](std::function<void()> function) { queue.push_back(std::move(function)); };
   OutcomeList outcomes;
   m_first.Source().GetAsync({}, CancelToken(), outcomes.MakeCallback());
-  for (int step = 0; step < 2; ++step) { // the file, the provider
+  for (int step = 0; step < 2; ++step) { // first the file, then the provider
     queue.front()();
     queue.pop_front();
   }

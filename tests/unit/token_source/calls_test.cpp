@@ -1,5 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
-// How calls end that wait: deadline, cancellation, destruction, executors, threads.
+// How waiting calls end: deadline, cancellation, destruction, executors, threads.
 
 #include "support/recorded_log.h"
 #include "support/rendezvous.h"
@@ -48,7 +48,7 @@ TEST(TokenSourceCall, EndsAtItsDeadlineAndLeavesTheOthersAndTheRequest) {
   EXPECT_THAT(late.Get(), ElementsAre(LATE));
 }
 
-TEST(TokenSourceCall, IsCancelledAloneByEitherOfItsTokens) {
+TEST(TokenSourceCall, IsCancelledByEitherOfItsTokensAndTheOthersContinue) {
   SourceStage stage;
   const CancelSource cancel;
   OutcomeList first;
@@ -157,14 +157,14 @@ TEST(TokenSourceCall, ThatWaitsEndsWhenTheSourceIsDestroyed) {
     EXPECT_THROWS_MESSAGE(stage.Source().Get(options), CancelledException,
                           "The operation was cancelled because its token source was destroyed");
   });
-  while (stage.time.CountTimers() < 2) { // that of the attempt, and that of the call, which then waits
+  while (stage.time.CountTimers() < 2) { // one of the attempt, and one of the call, which then waits
     std::this_thread::yield();
   }
   stage.Source().Close();
   caller.join();
 }
 
-TEST(TokenSourceCall, SetsAFutureWhereverItEnds) {
+TEST(TokenSourceCall, SetsAFutureWithoutTheExecutor) {
   SourceStage stage;
   stage.options.executor = [](const std::function<void()> &) { ADD_FAILURE() << "the executor was used"; };
   std::future<std::shared_ptr<const SamlToken>> future = stage.Source().GetFuture({});
@@ -177,7 +177,7 @@ TEST(TokenSourceCall, SetsAFutureWhereverItEnds) {
   EXPECT_THROWS_MESSAGE(future.get(), CommunicationException, "down");
 }
 
-TEST(TokenSourceCall, CallsBackOnItsExecutorAlsoWithATokenThatIsThere) {
+TEST(TokenSourceCall, CallsBackOnItsExecutorEvenIfThereIsAlreadyAToken) {
   SourceStage stage;
   stage.Provide(stage.Token("first", 1000s));
   std::deque<std::function<void()>> queue;

@@ -18,7 +18,7 @@ class DatedToken final : public SsoClient::SamlToken {
 public:
   enum class Kind { BEARER, RENEWABLE };
 
-  /// @param start and `end` in microseconds since 1970
+  /// @param start in microseconds since 1970, UTC, like `end`
   DatedToken(std::string id, std::int64_t start, std::int64_t end, Kind kind = Kind::BEARER)
       : m_id(std::move(id)), m_xml("<" + m_id + ">"), m_start(Tarvel::System::DateTimeFromUtc(start, false)),
         m_end(Tarvel::System::DateTimeFromUtc(end, false)), m_kind(kind) {
@@ -28,7 +28,7 @@ public:
   DatedToken &operator=(const DatedToken &) = delete;
   ~DatedToken() { --Alive(); }
 
-  /// How many exist.
+  /// How many tokens exist.
   static std::atomic<int> &Alive() {
     static std::atomic<int> alive{0};
     return alive;

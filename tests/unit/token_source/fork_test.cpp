@@ -65,7 +65,7 @@ TEST(TokenSourceAfterFork, ReturnsAndRefreshesTheTokenOfTheParentInTheChild) {
   EXPECT_EQ(stage.Ask(), "first");
 }
 
-TEST(TokenSourceAfterFork, LeavesAnAttemptOfTheParentWhenItIsDestroyedInTheChild) {
+TEST(TokenSourceAfterFork, DoesNotCancelAnAttemptOfTheParentWhenItIsDestroyedInTheChild) {
   SourceStage stage;
   OutcomeList parents;
   stage.Source().GetAsync({}, CancelToken(), parents.MakeCallback());

@@ -1,5 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
-// What a call that asks for the token ends with, and when the service is asked.
+// The outcomes of calls that ask for the token, and when the source sends a request.
 
 #include "unit/token_source/source_stage.h"
 

@@ -64,7 +64,7 @@ void ManualTime::Advance(std::chrono::nanoseconds time) {
   }
 }
 
-/// Runs the earliest timer at its time; if there is none until `end`, moves the clocks there and returns false.
+/// Runs the earliest timer at its time; if there is none until `end`, moves the clocks to `end` and returns false.
 bool ManualTime::RunNextUntil(SteadyClock::time_point end) {
   Tarvel::Ref<ManualTimer> item;
   {

@@ -27,7 +27,7 @@ std::shared_ptr<const DatedToken> MakeToken(const std::string &id) {
 
 } // namespace
 
-TEST(PublishedToken, IsNothingAtFirstAndAfterItIsCleared) {
+TEST(PublishedToken, IsNullAtFirstAndAfterItIsCleared) {
   PublishedToken published;
   EXPECT_EQ(published.Read(0), nullptr);
   published.Publish(MakeToken("a"), 0, ALWAYS);
@@ -67,7 +67,7 @@ TEST(PublishedToken, ReleasesATokenWhenItIsReplacedClearedOrDestroyed) {
   EXPECT_EQ(DatedToken::Alive(), before);
 }
 
-TEST(PublishedToken, GivesSixteenReadersWholeTokensWhileAWriterReplacesThem) {
+TEST(PublishedToken, ReturnsWholeTokensToSixteenReadersWhileAWriterReplacesThem) {
   constexpr int REPLACEMENTS = IS_SANITIZED ? 10'000 : 50'000;
   const int before = DatedToken::Alive();
   {

@@ -33,7 +33,7 @@ TEST(TokenSourceRefresh, BeginsByItselfIfACallHasAskedForTheToken) {
   EXPECT_EQ(stage.issuer->Count(), 2U);
 }
 
-TEST(TokenSourceRefresh, DoesNotBeginIfNoCallHasAskedSinceTheLastOne) {
+TEST(TokenSourceRefresh, DoesNotBeginIfNoCallHasAskedSinceTheLastRefresh) {
   const int before = DatedToken::Alive();
   SourceStage stage;
   stage.Provide(stage.Token("first", 1000s));
@@ -50,7 +50,7 @@ TEST(TokenSourceRefresh, DoesNotBeginIfNoCallHasAskedSinceTheLastOne) {
   EXPECT_EQ(stage.issuer->Count(), 3U);
 }
 
-TEST(TokenSourceRefresh, SpreadsItselfByTheJitter) {
+TEST(TokenSourceRefresh, BeginsEarlierByTheJitter) {
   SourceStage stage;
   stage.random = 1;
   stage.Provide(stage.Token("first", 1000s));
@@ -182,7 +182,7 @@ TEST(TokenSourceRefresh, DoesNotRenewATokenThatHasEnded) {
   EXPECT_THAT(stage.issuer->GetTexts(), ElementsAre("acquire alice", "acquire alice"));
 }
 
-TEST(TokenSourceRefresh, GivesUpAnAttemptAfterItsTimeAndCancelsTheRequest) {
+TEST(TokenSourceRefresh, EndsAnAttemptAfterItsTimeAndCancelsTheRequest) {
   SourceStage stage;
   stage.options.attemptTimeout = 5s;
   OutcomeList outcomes;

@@ -189,7 +189,7 @@ void SourceModel::Advance(std::int64_t time) {
   }
 }
 
-/// Moves both clocks and does what happens at that moment.
+/// Moves both clocks to `moment`, and does what is due at that moment.
 void SourceModel::Reach(std::int64_t moment) {
   // The wall clock shows whole microseconds.
   wall += moment / 1000 - steady / 1000;
@@ -219,7 +219,7 @@ void SourceModel::Destroy() {
   for (const auto &call : m_waiting) {
     End(call.first, "CancelledException: The operation was cancelled because its token source was destroyed");
   }
-  // The service and the clocks stay, and so does a call of the provider, which belongs to no source any more.
+  // The service and the clocks remain. A call of the provider that is under way has no effect on the next source.
   SourceModel next;
   next.wall = wall;
   next.steady = steady;

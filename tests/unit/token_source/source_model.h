@@ -12,10 +12,10 @@
 
 namespace Testing {
 
-/// A source with the options that the model test uses. It has no timers: `Advance` goes from one moment at which something may
-/// happen to the next. What calls end with and what the service receives is collected in `events`, in order.
+/// A source with the options that the model test uses. It has no timers: `Advance` moves from one moment at which
+/// something may happen to the next. `events` collects the outcomes of calls and the requests to the service, in order.
 ///
-/// Wall-clock times are in microseconds, those of the steady clock in nanoseconds.
+/// Wall-clock times are in microseconds, and times of the steady clock in nanoseconds.
 class SourceModel {
 public:
   static constexpr std::int64_t MARGIN = 30'000'000;
@@ -83,7 +83,7 @@ private:
   bool m_isProviderCalled = false;
   bool m_isRenewalForbidden = false;
   std::int64_t m_attemptEnd = 0;
-  std::deque<Request> m_requests; // which the service has not answered, even if they are given up
+  std::deque<Request> m_requests; // not answered yet, even if their attempts have ended
 };
 
 } // namespace Testing

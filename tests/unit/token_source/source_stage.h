@@ -17,7 +17,7 @@
 
 namespace Testing {
 
-/// A service that answers when the test says so.
+/// A service that answers when the test calls `Answer`.
 class ManualIssuer final : public SsoClient::TokenIssuer {
 public:
   struct Request {
@@ -70,8 +70,8 @@ private:
 
 std::string DescribeOutcome(const SsoClient::TokenOutcome &outcome);
 
-/// Makes the source when it is first used; so a test can change `options` before. Callbacks run on the thread that ends the call,
-/// and the provider runs on the thread that starts the attempt, unless the test changes that.
+/// Makes the source when it is first used, so a test can change `options` before. Callbacks run on the thread that ends
+/// the call, and the provider runs on the thread that starts the attempt, unless the test changes that.
 class SourceStage {
 public:
   SourceStage();
@@ -85,8 +85,8 @@ public:
   SsoClient::CredentialProvider provider;
   SsoClient::Executor blocking;
   std::shared_ptr<const SsoClient::TokenCacheFile> cache;
-  double random = 0;                 ///< what the source's random numbers are
-  std::function<void()> whileLocked; ///< called with each of them, while the source is locked
+  double random = 0;                 ///< the value of each random number of the source
+  std::function<void()> whileLocked; ///< called for each random number, while the source is locked
 
   SsoClient::TokenSourceCore &Source();
 
@@ -97,7 +97,7 @@ public:
   std::shared_ptr<const SsoClient::SamlToken> Token(const std::string &id, std::chrono::nanoseconds lifetime,
                                                     DatedToken::Kind kind = DatedToken::Kind::BEARER) const;
 
-  /// What a call ends with now: `DescribeOutcome`, or "waits".
+  /// The outcome of a call that starts now: `DescribeOutcome`, or "waits".
   std::string Ask(const SsoClient::GetOptions &getOptions = {});
 
   /// Makes the source get the token.
@@ -107,7 +107,7 @@ private:
   std::shared_ptr<SsoClient::TokenSourceCore> m_source;
 };
 
-/// How a service fails.
+/// The outcome of a request that fails.
 SsoClient::TokenOutcome Failure(const std::string &message);
 
 } // namespace Testing

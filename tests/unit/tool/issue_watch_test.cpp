@@ -35,7 +35,7 @@ void Perform(IssueWatch &watch, OperationEndedEvent::Outcome outcome) {
   watch.OnEnded({}, ended);
 }
 
-TEST(IssueWatch, KnowsWhenATokenWasAskedForOnlyOnceItWasIssued) {
+TEST(IssueWatch, ReportsWhenATokenWasRequestedOnlyAfterItWasIssued) {
   IssueWatch watch(nullptr);
   EXPECT_FALSE(watch.GetAskedAt());
   Perform(watch, OperationEndedEvent::Outcome::FAILED);

@@ -14,7 +14,7 @@
 namespace SsoClient::Tool {
 namespace {
 
-TEST(TaskQueue, RunsTasksInTheirOrderUntilOneIsTheLast) {
+TEST(TaskQueue, RunsTasksInTheirOrderUntilTheConditionIsTrue) {
   TaskQueue tasks;
   bool isDone = false;
   std::vector<int> run;
@@ -28,7 +28,7 @@ TEST(TaskQueue, RunsTasksInTheirOrderUntilOneIsTheLast) {
   EXPECT_EQ((std::vector<int>{1, 2}), run);
 }
 
-TEST(TaskQueue, RunsTasksOfOtherThreadsOnItsOwn) {
+TEST(TaskQueue, RunsTasksOfOtherThreadsOnItsOwnThread) {
   TaskQueue tasks;
   bool isDone = false;
   std::thread::id ran;
@@ -43,7 +43,7 @@ TEST(TaskQueue, RunsTasksOfOtherThreadsOnItsOwn) {
   EXPECT_EQ(std::this_thread::get_id(), ran);
 }
 
-/// Posts a task, and returns what is ready when the task was discarded.
+/// Posts a task. The future becomes ready when the task is run or discarded.
 std::future<int> PostPromise(TaskQueue &tasks) {
   auto promise = std::make_shared<std::promise<int>>();
   std::future<int> result = promise->get_future();

@@ -1,9 +1,9 @@
 // SPDX-License-Identifier: Apache-2.0
-// A host that ends while operations of a client over TLS are under way. What the client belongs to is in MODE:
-//   never-destroyed  nothing destroys it
-//   static           the destructor of a static object
-//   at-exit          the same, and a function of atexit starts and awaits another operation
-//   detached         a detached thread, which waits for an operation
+// A host that ends while operations of a client over TLS are under way. MODE decides how long the client lives:
+//   never-destroyed  it is never destroyed
+//   static           it is a static object
+//   at-exit          it is never destroyed, and a function of atexit starts and awaits another operation
+//   detached         it is never destroyed, and detached threads wait for operations
 #include "support/outliving_thread.h"
 
 #include <ssoclient/client/token_client.h>
@@ -75,7 +75,7 @@ std::shared_ptr<SsoClient::TokenClient> &GetClient() {
   return client;
 }
 
-/// Waits for an operation that begins when OpenSSL has cleaned itself up, or soon will.
+/// Waits for an operation that begins shortly before or after OpenSSL releases its own data.
 void AcquireAtExit() {
   try {
     GetClient()->Acquire(Password(), Spec(), SsoClient::CallOptions::WithTimeout(std::chrono::seconds(1)));
@@ -88,7 +88,7 @@ void AcquireAtExit() {
 
 int main() {
   if (MODE == "at-exit") {
-    std::atexit(AcquireAtExit); // called after the static client is destroyed; `kept` is not
+    std::atexit(AcquireAtExit); // called after the static pointer is destroyed; `kept` is not destroyed
     static auto *const kept = new std::shared_ptr<SsoClient::TokenClient>(GetClient());
     static_cast<void>(kept);
   }

@@ -1,7 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
-// A test preloads this into the tool. It sends the process a signal, whose number is in the environment, when a file
-// has been written and does not have its final name yet. With a second signal in the
-// environment, it sends that, too, and never returns.
+// A test preloads this into the tool. When the tool has written a file that does not have its final name yet, this
+// `fsync` sends the process the signal SIGNAL_AT_FSYNC of the environment. If SECOND_SIGNAL_AT_FSYNC is set, it sends
+// that signal, too, and never returns.
 
 #include <csignal>
 #include <cstdlib>
