@@ -281,7 +281,8 @@ bool ClientOperation::Decide(OperationEnding ending) noexcept {
   return true;
 }
 
-/// Neither the thread that cancels nor one that must not block runs the host's code.
+/// Neither the thread that cancels nor one that must not block runs the host's code. However many steps of other
+/// operations are queued, the end comes before them.
 void ClientOperation::FinishElsewhere() noexcept {
   if (m_waiter) {
     const std::lock_guard<ForkSafeMutex> lock(m_mutex);
@@ -289,7 +290,7 @@ void ClientOperation::FinishElsewhere() noexcept {
     return;
   }
   try {
-    GetComputePool()->QueueWorkItem([self = shared_from_this()] { self->Finish(true); });
+    GetComputePool()->QueueUrgentItem([self = shared_from_this()] { self->Finish(true); });
   } catch (...) {
     Finish(false);
   }
