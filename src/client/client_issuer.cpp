@@ -16,14 +16,16 @@ ClientIssuer::ClientIssuer(std::shared_ptr<const TokenClient> client) : m_client
 
 void ClientIssuer::Acquire(const Credential &credential, const TokenSpec &spec, const CallOptions &options,
                            TokenCallback callback) const {
+  ClientOperation::Completion completion = CompletionOf(std::move(callback)); // before the operation reports its start
   std::make_shared<ClientOperation>(m_client->m_core, Acquisition{credential, spec}, options)
-      ->Start(CompletionOf(std::move(callback)), true);
+      ->Start(std::move(completion), true);
 }
 
 void ClientIssuer::Renew(const std::shared_ptr<const SamlToken> &token, std::int64_t lifetimeSec,
                          const CallOptions &options, TokenCallback callback) const {
+  ClientOperation::Completion completion = CompletionOf(std::move(callback)); // before the operation reports its start
   std::make_shared<ClientOperation>(m_client->m_core, Renewal{token, lifetimeSec}, options)
-      ->Start(CompletionOf(std::move(callback)), true);
+      ->Start(std::move(completion), true);
 }
 
 const ClientCore &ClientIssuer::GetCore() const noexcept {

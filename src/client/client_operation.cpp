@@ -48,15 +48,19 @@ ClientOperation::ClientOperation(std::shared_ptr<ClientCore> core, ClientTask ta
       m_kind(KindOf(task)), m_deadline(options.deadline),
       m_retryPolicy(options.retryPolicy.value_or(m_core->GetOptions().retryPolicy)),
       m_executor(options.executor ? options.executor : m_core->GetOptions().executor),
-      m_cancelToken(options.cancelToken), m_frame(NameOf(task), CLIENT_LINES),
-      m_events(m_observer.get(), NameOf(task), m_frame.GetId()) {
+      m_cancelToken(options.cancelToken), m_secrets{std::make_unique<ClientTask>(std::move(task)), {}, {}, {}},
+      m_steps(FindSteps(options)), m_frame(NameOf(*m_secrets.task), CLIENT_LINES),
+      m_events(m_observer.get(), NameOf(*m_secrets.task), m_frame.GetId()) {}
+
+/// Null when the options are refused.
+std::shared_ptr<const TokenSteps> ClientOperation::FindSteps(const CallOptions &options) {
   try {
     CheckRetryPolicy(m_retryPolicy);
-    m_steps = m_core->GetSteps(options);
+    return m_core->GetSteps(options);
   } catch (const Tarvel::Exception &) {
     m_refusal = std::current_exception();
+    return nullptr;
   }
-  m_secrets.task = std::make_unique<ClientTask>(std::move(task));
 }
 
 void ClientOperation::Start(Completion completion, bool isHere) {
@@ -66,7 +70,12 @@ void ClientOperation::Start(Completion completion, bool isHere) {
 }
 
 OperationEnding ClientOperation::RunToEnd() {
-  m_waiter = std::make_unique<Waiter>();
+  try {
+    m_waiter = std::make_unique<Waiter>();
+  } catch (...) {
+    Abandon(std::current_exception());
+    throw;
+  }
   Launch();
   std::unique_lock<ForkSafeMutex> lock(m_mutex);
   while (!m_waiter->isOver) {
@@ -282,7 +291,8 @@ bool ClientOperation::Decide(OperationEnding ending) noexcept {
   return true;
 }
 
-/// Finishes on another thread: neither a thread that cancels nor one that must not block should run the host's code.
+/// Finishes on another thread: neither a thread that cancels nor one that must not block should run the host's code. However many steps of other
+/// operations are queued, the end comes before them.
 void ClientOperation::FinishElsewhere() noexcept {
   if (m_waiter) {
     const std::lock_guard<ForkSafeMutex> lock(m_mutex);
@@ -290,7 +300,7 @@ void ClientOperation::FinishElsewhere() noexcept {
     return;
   }
   try {
-    GetComputePool()->QueueWorkItem([self = shared_from_this()] { self->Finish(true); });
+    GetComputePool()->QueueUrgentItem([self = shared_from_this()] { self->Finish(true); });
   } catch (...) {
     Finish(false);
   }

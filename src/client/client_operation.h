@@ -127,6 +127,7 @@ private:
   void StartAgain() noexcept;
 
   // How the operation starts.
+  std::shared_ptr<const TokenSteps> FindSteps(const CallOptions &options);
   void Launch();
   void StartDeadlineTimer();
   void RegisterCancel();
@@ -160,18 +161,19 @@ private:
   const RetryPolicy m_retryPolicy;
   const Executor m_executor;
   CancelToken m_cancelToken;
+  Secrets m_secrets;            // used by the step that runs
+  std::exception_ptr m_refusal; // of the options of the call
+  const std::shared_ptr<const TokenSteps> m_steps;
+  // The start is reported when all that may fail has been made. Otherwise no end would follow it.
   OperationFrame m_frame;
   OperationEvents m_events;
 
   // Used by the step that runs.
-  std::shared_ptr<const TokenSteps> m_steps;
-  std::exception_ptr m_refusal; // why the options of the call are not valid
   std::shared_ptr<TransportSession> m_session;
   std::shared_ptr<ResponseFacts> m_facts;
   std::exception_ptr m_responseFailure;
   int m_attempt = 1;
   int m_leg = 0;
-  Secrets m_secrets;
 
   mutable Tarvel::ForkSafeMutex m_mutex; // guards what follows
   bool m_isDecided = false;

@@ -23,9 +23,6 @@ using Tarvel::ForkSafeMutex;
 /// A thread that waits for the operation does not read a longer response, because reading it takes long.
 constexpr std::size_t LONG_RESPONSE_BYTES = 1024 * 1024;
 
-/// No delay is longer, so that no addition overflows.
-constexpr milliseconds LONGEST_DELAY = std::chrono::hours(24 * 365);
-
 std::exception_ptr ToPointer(const Tarvel::Exception &failure) noexcept {
   std::exception_ptr pointer;
   try {
@@ -297,7 +294,7 @@ bool ClientOperation::RetryLater() {
   if (!delay) {
     return false;
   }
-  const Clock::time_point next = time.GetSteadyTime() + std::min(*delay, LONGEST_DELAY);
+  const Clock::time_point next = time.GetSteadyTime() + *delay;
   if (m_deadline && next >= *m_deadline) {
     return false;
   }

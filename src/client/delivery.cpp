@@ -47,7 +47,7 @@ private:
 
 void RunOnComputePool(const std::shared_ptr<Delivery> &delivery) noexcept {
   try {
-    Tarvel::System::GetComputePool()->QueueWorkItem([delivery] { delivery->Run(); });
+    Tarvel::System::GetComputePool()->QueueUrgentItem([delivery] { delivery->Run(); });
   } catch (...) {
     delivery->Run(); // there is no thread or no memory
   }

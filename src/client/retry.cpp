@@ -18,16 +18,18 @@ using std::chrono::milliseconds;
 constexpr int SERVICE_UNAVAILABLE = 503;
 /// A number with more digits is longer than any wait: it means "never".
 constexpr std::size_t MAX_DIGITS = 9;
+/// No delay is longer, even if the policy allows more, so that no sum of two overflows.
+constexpr milliseconds LONGEST_DELAY = std::chrono::hours(24 * 365);
 
 bool IsDigit(char c) noexcept {
   return c >= '0' && c <= '9';
 }
 
 /// The delay before attempt `attempt` + 1, without jitter.
-milliseconds GetBackOff(const RetryPolicy &policy, int attempt) {
-  milliseconds delay = std::min(policy.firstDelay, policy.longestDelay);
-  for (int doubled = 1; doubled < attempt && delay.count() > 0 && delay < policy.longestDelay; ++doubled) {
-    delay = delay > policy.longestDelay / 2 ? policy.longestDelay : delay * 2;
+milliseconds GetBackOff(milliseconds first, milliseconds longest, int attempt) {
+  milliseconds delay = std::min(first, longest);
+  for (int doubled = 1; doubled < attempt && delay.count() > 0 && delay < longest; ++doubled) {
+    delay = delay > longest / 2 ? longest : delay * 2;
   }
   return delay;
 }
@@ -71,7 +73,8 @@ boost::optional<milliseconds> GetRetryDelay(const RetryPolicy &policy, int attem
   if (attempt >= policy.attempts) {
     return boost::none;
   }
-  const milliseconds backOff = WithJitter(GetBackOff(policy, attempt), random);
+  const milliseconds longest = std::min(policy.longestDelay, LONGEST_DELAY);
+  const milliseconds backOff = WithJitter(GetBackOff(policy.firstDelay, longest, attempt), random);
   if (IsUnsent(facts)) {
     return backOff;
   }
@@ -79,11 +82,11 @@ boost::optional<milliseconds> GetRetryDelay(const RetryPolicy &policy, int attem
     return boost::none;
   }
   const boost::optional<milliseconds> demanded = ReadRetryAfter(facts.retryAfter, now);
-  if (!demanded || *demanded > policy.longestDelay) {
+  if (!demanded || *demanded > longest) {
     return boost::none;
   }
   // The delay with jitter is added to the time that the service demands, so no request is sent before that time.
-  return std::min(*demanded + backOff, policy.longestDelay);
+  return std::min(*demanded + backOff, longest);
 }
 
 } // namespace SsoClient

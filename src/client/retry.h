@@ -24,7 +24,7 @@ boost::optional<std::chrono::milliseconds> ReadRetryAfter(const std::string &val
                                                           std::chrono::system_clock::time_point now);
 
 /// How long to wait before a request that failed with a `CommunicationException` is repeated; `boost::none` when it is
-/// not repeated.
+/// not repeated. At most a year, even if the policy allows more.
 /// @param attempt the number of the attempt that failed, from 1
 /// @param facts those of its response
 /// @param random from 0 to 1, for the jitter

@@ -37,6 +37,12 @@ std::shared_ptr<ClientOperation> MakeOperation(const std::shared_ptr<ClientCore>
   return std::make_shared<ClientOperation>(core, std::move(task), options);
 }
 
+/// Starts an operation. Its completion is made before it, because the operation reports its start when it is made.
+void StartOperation(const std::shared_ptr<ClientCore> &core, ClientTask task, const CallOptions &options,
+                    ClientOperation::Completion completion, bool isHere = false) {
+  MakeOperation(core, std::move(task), options)->Start(std::move(completion), isHere);
+}
+
 void SetValue(std::promise<std::shared_ptr<const SamlToken>> &promise, OperationEnding &&ending) {
   promise.set_value(std::move(ending.token));
 }
@@ -51,16 +57,16 @@ std::future<Value> StartWithFuture(const std::shared_ptr<ClientCore> &core, Clie
                                    const CallOptions &options) {
   const auto promise = std::make_shared<std::promise<Value>>();
   std::future<Value> future = promise->get_future();
-  MakeOperation(core, std::move(task), options)
-      ->Start(
-          [promise](OperationEnding &&ending) {
-            if (ending.failure) {
-              promise->set_exception(std::move(ending.failure));
-            } else {
-              SetValue(*promise, std::move(ending));
-            }
-          },
-          true);
+  StartOperation(
+      core, std::move(task), options,
+      [promise](OperationEnding &&ending) {
+        if (ending.failure) {
+          promise->set_exception(std::move(ending.failure));
+        } else {
+          SetValue(*promise, std::move(ending));
+        }
+      },
+      true);
   return future;
 }
 
@@ -107,19 +113,19 @@ void TokenClient::ValidateAsync(const std::shared_ptr<const SamlToken> &token, c
 void TokenClient::StartAcquire(const std::shared_ptr<ClientCore> &core, const Credential &credential,
                                const TokenSpec &spec, const CallOptions &options, TokenCallback callback) {
   CheckRequired(static_cast<bool>(callback));
-  MakeOperation(core, Acquisition{credential, spec}, options)->Start(CompletionOf(std::move(callback)));
+  StartOperation(core, Acquisition{credential, spec}, options, CompletionOf(std::move(callback)));
 }
 
 void TokenClient::StartRenew(const std::shared_ptr<ClientCore> &core, const std::shared_ptr<const SamlToken> &token,
                              std::int64_t lifetimeSec, const CallOptions &options, TokenCallback callback) {
   CheckRequired(static_cast<bool>(callback));
-  MakeOperation(core, Renewal{token, lifetimeSec}, options)->Start(CompletionOf(std::move(callback)));
+  StartOperation(core, Renewal{token, lifetimeSec}, options, CompletionOf(std::move(callback)));
 }
 
 void TokenClient::StartValidate(const std::shared_ptr<ClientCore> &core, const std::shared_ptr<const SamlToken> &token,
                                 const CallOptions &options, ValidityCallback callback) {
   CheckRequired(static_cast<bool>(callback));
-  MakeOperation(core, Validation{token}, options)->Start(CompletionOf(std::move(callback)));
+  StartOperation(core, Validation{token}, options, CompletionOf(std::move(callback)));
 }
 
 std::future<std::shared_ptr<const SamlToken>>

@@ -68,11 +68,17 @@ struct PoolState {
 
   ForkSafeMutex mutex; // guards all that follows
   std::condition_variable_any changed;
+  WorkQueue urgent; // starts before `queue`
   WorkQueue queue;
   std::list<std::thread> threads;
   std::list<std::thread> retired; // ended or about to end; joined by the next thread that retires, or by the destructor
   std::size_t idle = 0;
   bool ended = false;
+
+  // Called under the lock.
+  std::size_t CountQueued() const noexcept { return urgent.size() + queue.size(); }
+  /// The first item that is queued; null when both queues are empty.
+  Ref<WorkItem> GetFirstQueued() const noexcept;
 };
 
 /// The pool that the calling thread belongs to; null on a thread that belongs to no pool.
@@ -80,8 +86,8 @@ thread_local const PoolState *currentPool = nullptr;
 
 class WorkItem final : public ScheduledItem {
 public:
-  WorkItem(std::shared_ptr<PoolState> pool, std::function<void()> work)
-      : m_pool(std::move(pool)), m_work(std::move(work)) {}
+  WorkItem(std::shared_ptr<PoolState> pool, WorkQueue PoolState::*queue, std::function<void()> work)
+      : m_pool(std::move(pool)), m_queue((*m_pool).*queue), m_work(std::move(work)) {}
 
   void Cancel() noexcept override {
     const Ref<WorkItem> self(this); // the queue's reference may be the last
@@ -92,7 +98,7 @@ public:
         return;
       }
       m_stage = Stage::DONE;
-      m_pool->queue.erase(m_place);
+      m_queue.erase(m_place);
       work.swap(m_work);
     }
   }
@@ -101,9 +107,9 @@ public:
   bool IsDone() const noexcept override { return m_stage == Stage::DONE || m_pool->IsOfParent(); }
 
   /// Called under the pool's lock.
-  void Enqueue() { m_place = m_pool->queue.insert(m_pool->queue.end(), Ref<WorkItem>(this)); }
+  void Enqueue() { m_place = m_queue.insert(m_queue.end(), Ref<WorkItem>(this)); }
   void Dequeue() noexcept {
-    m_pool->queue.erase(m_place);
+    m_queue.erase(m_place);
     m_stage = Stage::RUNNING;
   }
 
@@ -122,10 +128,16 @@ private:
   enum class Stage { QUEUED, RUNNING, DONE };
 
   const std::shared_ptr<PoolState> m_pool;
+  WorkQueue &m_queue; // of the pool
   std::function<void()> m_work;
   WorkQueue::iterator m_place; // while queued
   std::atomic<Stage> m_stage{Stage::QUEUED};
 };
+
+Ref<WorkItem> PoolState::GetFirstQueued() const noexcept {
+  const WorkQueue &first = urgent.empty() ? queue : urgent;
+  return first.empty() ? Ref<WorkItem>() : first.front();
+}
 
 // Constant-initialised and never destroyed.
 std::atomic<ThreadEndHook> threadEndHook{nullptr};
@@ -139,15 +151,14 @@ bool MayEnd(const PoolState &pool) noexcept {
 /// The next item to run; null when the thread has been idle for long enough, or the pool has ended.
 Ref<WorkItem> WaitForWork(PoolState &pool, std::unique_lock<ForkSafeMutex> &lock) {
   ++pool.idle;
-  while (!pool.changed.wait_for(lock, pool.idleTime, [&pool] { return pool.ended || !pool.queue.empty(); }) &&
+  while (!pool.changed.wait_for(lock, pool.idleTime, [&pool] { return pool.ended || pool.CountQueued() > 0; }) &&
          !MayEnd(pool)) {
   }
   --pool.idle;
-  if (pool.ended || pool.queue.empty()) {
-    return {};
+  Ref<WorkItem> item = pool.ended ? Ref<WorkItem>() : pool.GetFirstQueued();
+  if (item) {
+    item->Dequeue();
   }
-  Ref<WorkItem> item = pool.queue.front();
-  item->Dequeue();
   return item;
 }
 
@@ -196,14 +207,13 @@ void AddThread(const std::shared_ptr<PoolState> &pool) {
   }
 }
 
-/// The first item that is queued; null when the queue is empty.
-Ref<WorkItem> GetFirstQueued(PoolState &pool) {
+Ref<WorkItem> LockAndGetFirstQueued(PoolState &pool) {
   const std::lock_guard<ForkSafeMutex> lock(pool.mutex);
-  return pool.queue.empty() ? Ref<WorkItem>() : pool.queue.front();
+  return pool.GetFirstQueued();
 }
 
 void CancelQueued(PoolState &pool) {
-  while (const Ref<WorkItem> item = GetFirstQueued(pool)) {
+  while (const Ref<WorkItem> item = LockAndGetFirstQueued(pool)) {
     item->Cancel();
   }
 }
@@ -215,17 +225,11 @@ public:
   }
 
   Ref<ScheduledItem> QueueWorkItem(std::function<void()> work) override {
-    const std::shared_ptr<PoolState> state = GetState();
-    const Ref<WorkItem> item = MakeRef<WorkItem>(state, std::move(work));
-    {
-      const std::lock_guard<ForkSafeMutex> lock(state->mutex);
-      item->Enqueue();
-      if (state->queue.size() > state->idle && state->threads.size() < state->ceiling) {
-        StartThreadFor(*item, state);
-      }
-    }
-    state->changed.notify_one(); // after the unlock: otherwise the woken thread would wait for the lock at once
-    return item;
+    return Enqueue(&PoolState::queue, std::move(work));
+  }
+
+  Ref<ScheduledItem> QueueUrgentItem(std::function<void()> work) override {
+    return Enqueue(&PoolState::urgent, std::move(work));
   }
 
   std::size_t GetThreadCeiling() const noexcept override {
@@ -251,6 +255,20 @@ private:
         thread.join();
       }
     }
+  }
+
+  Ref<ScheduledItem> Enqueue(WorkQueue PoolState::*queue, std::function<void()> work) {
+    const std::shared_ptr<PoolState> state = GetState();
+    const Ref<WorkItem> item = MakeRef<WorkItem>(state, queue, std::move(work));
+    {
+      const std::lock_guard<ForkSafeMutex> lock(state->mutex);
+      item->Enqueue();
+      if (state->CountQueued() > state->idle && state->threads.size() < state->ceiling) {
+        StartThreadFor(*item, state);
+      }
+    }
+    state->changed.notify_one(); // after the lock is released: otherwise the woken thread would wait for it at once
+    return item;
   }
 
   /// Makes the threads end, and returns them to be joined.

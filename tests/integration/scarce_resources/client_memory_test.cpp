@@ -111,6 +111,20 @@ SsoClient::TokenSpec Spec() {
   return spec;
 }
 
+/// Counts the starts and the ends of operations, without allocating memory.
+class CountingObserver final : public SsoClient::OperationObserver {
+public:
+  void OnStarted(const SsoClient::OperationInfo &) override { ++m_starts; }
+  void OnEnded(const SsoClient::OperationInfo &, const SsoClient::OperationEndedEvent &) override { ++m_ends; }
+
+  int CountStarts() const { return m_starts; }
+  int CountEnds() const { return m_ends; }
+
+private:
+  std::atomic<int> m_starts{0};
+  std::atomic<int> m_ends{0};
+};
+
 class ClientWithoutMemory : public testing::TestWithParam<Shortage> {
 protected:
   const ScriptedServer m_server{AnswerWithAToken};
@@ -128,6 +142,45 @@ TEST_P(ClientWithoutMemory, HasOneOutcomeForEachOperation) {
     client.AcquireAsync(credential, spec, options, note.ForToken());
   });
   EXPECT_TRUE(client.Acquire(credential, spec, options));
+}
+
+TEST_P(ClientWithoutMemory, ReportsTheEndOfEachOperationThatItHasReportedAsStarted) {
+  const auto observer = std::make_shared<CountingObserver>();
+  const TokenClient client(ConfigOf(m_server));
+  const SsoClient::Credential credential = Password();
+  const SsoClient::TokenSpec spec = Spec();
+  SsoClient::CallOptions options;
+  options.observer = observer;
+  options.dialect.emplace(); // so that the call needs steps of its own
+  client.Acquire(credential, spec, options);
+  ExpectOneOutcomeWhereverMemoryRunsOut(GetParam(), m_server.GetPort(), [&](OutcomeNote &note) {
+    client.AcquireAsync(credential, spec, options, note.ForToken());
+  });
+  EXPECT_EQ(observer->CountStarts(), observer->CountEnds());
+}
+
+TEST_P(ClientWithoutMemory, ReportsTheEndOfEachCallThatWaits) {
+  const auto observer = std::make_shared<CountingObserver>();
+  const TokenClient client(ConfigOf(m_server));
+  const SsoClient::Credential credential = Password();
+  const SsoClient::TokenSpec spec = Spec();
+  SsoClient::CallOptions options;
+  options.observer = observer;
+  client.Acquire(credential, spec, options);
+  bool isComplete = false;
+  for (int pieces = 0; !isComplete; ++pieces) {
+    ASSERT_LT(pieces, MAX_PIECES);
+    StartShortOfMemory(GetParam(), pieces, [&] {
+      try {
+        client.Acquire(credential, spec, options);
+      } catch (const std::exception &failure) {
+        EXPECT_TRUE(IsDocumented(failure.what(), m_server.GetPort())) << failure.what();
+      }
+    });
+    isComplete = EndShortage() == 0;
+    EXPECT_TRUE(DrainIoThreads());
+  }
+  EXPECT_EQ(observer->CountStarts(), observer->CountEnds());
 }
 
 TEST_P(ClientWithoutMemory, HasOneOutcomeForEachCallOfASource) {

@@ -93,6 +93,20 @@ TEST(GetRetryDelay, DoesNotOverflowWithTheLargestPolicy) {
   EXPECT_EQ(GetRetryDelay(policy, 1'000'000'000, NoConnection().facts, NOW, 0.0)->count(), 0);
 }
 
+TEST(GetRetryDelay, IsAtMostAYearWithTheLargestPolicy) {
+  RetryPolicy policy;
+  policy.attempts = 2;
+  policy.longestDelay = policy.firstDelay = milliseconds::max();
+  const auto delayAfter = [&policy](const Reply &reply) {
+    const auto delay = GetRetryDelay(policy, 1, reply.facts, NOW, 1.0);
+    return delay ? delay->count() : -1;
+  };
+  constexpr std::int64_t YEAR = milliseconds(std::chrono::hours(24 * 365)).count();
+  EXPECT_EQ(delayAfter(NoConnection()), YEAR);
+  EXPECT_EQ(delayAfter(Unavailable("0")), YEAR);
+  EXPECT_EQ(delayAfter(Unavailable("9999999999")), -1);
+}
+
 TEST(GetRetryDelay, RepeatsARefusalOnlyWithRetryAfterAndNeverBeforeThatTime) {
   EXPECT_EQ(DelayAfter(1, Unavailable("0"), 1.0), 200);
   EXPECT_EQ(DelayAfter(1, Unavailable("1"), 0.0), 1000);

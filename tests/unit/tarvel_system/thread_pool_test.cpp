@@ -23,6 +23,7 @@
 #include <pthread.h>
 #include <stdexcept>
 #include <string>
+#include <thread>
 #include <vector>
 
 namespace Tarvel::System {
@@ -66,6 +67,41 @@ TEST(ThreadPool, StartsItemsInOrder) {
   ASSERT_EQ(last.get_future().wait_for(PATIENCE), std::future_status::ready);
   ASSERT_EQ(order.size(), 100u);
   EXPECT_TRUE(std::is_sorted(order.begin(), order.end()));
+}
+
+TEST(ThreadPool, StartsUrgentItemsBeforeTheOthersAndInOrder) {
+  const Ref<ThreadPool> pool = CreateThreadPool(1);
+  Gate gate;
+  pool->QueueWorkItem(gate.Wait());
+  std::vector<int> order;
+  std::promise<void> last;
+  pool->QueueWorkItem([&order] { order.push_back(3); });
+  pool->QueueWorkItem([&last] { last.set_value(); });
+  pool->QueueUrgentItem([&order] { order.push_back(1); });
+  const Ref<ScheduledItem> cancelled = pool->QueueUrgentItem([&order] { order.push_back(0); });
+  pool->QueueUrgentItem([&order] { order.push_back(2); });
+  cancelled->Cancel();
+  gate.Open();
+  ASSERT_EQ(last.get_future().wait_for(PATIENCE), std::future_status::ready);
+  EXPECT_EQ(order, (std::vector<int>{1, 2, 3}));
+}
+
+TEST(ThreadPool, StartsAThreadForAnUrgentItemAndDropsItWhenDestroyed) {
+  Ref<ThreadPool> pool = CreateThreadPool(1);
+  Gate gate;
+  std::promise<void> begun;
+  pool->QueueUrgentItem([&begun, wait = gate.Wait()] {
+    begun.set_value();
+    wait();
+  });
+  ASSERT_EQ(begun.get_future().wait_for(PATIENCE), std::future_status::ready);
+  const auto captured = std::make_shared<int>();
+  const Ref<ScheduledItem> dropped = pool->QueueUrgentItem([captured] { ADD_FAILURE() << "was run"; });
+  std::thread destroyer([&pool] { pool.reset(); });
+  EXPECT_TRUE(Eventually([&] { return dropped->IsDone(); }));
+  EXPECT_TRUE(Eventually([&] { return captured.use_count() == 1; }));
+  gate.Open();
+  destroyer.join();
 }
 
 TEST(ThreadPool, GrowsToTheCeilingAndNoFurther) {

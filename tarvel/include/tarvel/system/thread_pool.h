@@ -22,7 +22,7 @@ namespace Tarvel::System {
 /// queued never runs in the child, and counts as done.
 class TARVEL_API ThreadPool : public Object {
 public:
-  /// Queues `work` for one run and returns at once. Items start in the order in which they are queued. An exception
+  /// Queues `work` for one run and returns at once. These items start in the order in which they are queued. An exception
   /// that `work` throws is logged (logger "Tarvel", level 8) and ends that item only. `work` and what it captures
   /// are destroyed on the pool's thread after the run, or on the thread that removes a cancelled item from the queue.
   ///
@@ -30,6 +30,10 @@ public:
   /// that they wait for never start. Let the work that ends last queue the next item.
   /// @throws InvalidStateException when the pool has no thread and none can be started; `work` is then never run.
   virtual Ref<ScheduledItem> QueueWorkItem(std::function<void()> work) = 0;
+
+  /// The same, but the item starts before all that `QueueWorkItem` has queued. For the ends of operations, so that they
+  /// need not wait until the work of others has been done.
+  virtual Ref<ScheduledItem> QueueUrgentItem(std::function<void()> work) = 0;
 
   /// How many threads the pool may have at most.
   virtual std::size_t GetThreadCeiling() const noexcept = 0;
