@@ -99,6 +99,7 @@ public:
 private:
   bool MayAttempt(const Moment &now) const noexcept { return !m_isAttempting && now.steady >= m_notBefore; }
   bool IsUsable(const Moment &now) const noexcept { return m_token && m_times.IsUsable(now); }
+  void BeginBackOff(const Moment &now);
   Result Fail(const Moment &now, std::exception_ptr failure);
   std::exception_ptr FindFault(const SamlToken &token, const RefreshTimes &times, const Moment &now) const;
 

@@ -135,6 +135,18 @@ TEST_F(CachedSource, UsesADueTokenOfTheFileWhenTheServiceFails) {
   EXPECT_THAT(outcomes.Get(), ElementsAre("first"));
 }
 
+TEST_F(CachedSource, WaitsForTheBackOffWhenItUsesADueTokenBecauseTheServiceFails) {
+  m_first.Provide(Token("first", 1000s));
+  AdvanceBoth(800s);
+  EXPECT_EQ(m_second.Ask(), "waits");
+  m_second.issuer->Answer(Failure("down"));
+  m_second.time.Advance(1s - 1us);
+  EXPECT_EQ(m_second.Ask(), "first");
+  EXPECT_EQ(m_second.issuer->Count(), 1U);
+  m_second.time.Advance(1us);
+  EXPECT_EQ(m_second.issuer->Count(), 2U) << "a call has asked since";
+}
+
 TEST_F(CachedSource, DoesNotUseATokenOfTheFileThatIsAboutToExpire) {
   m_first.Provide(Token("first", 1000s));
   AdvanceBoth(970s);
