@@ -217,6 +217,15 @@ void RefreshAttempt::End(const TokenOutcome &outcome, bool isIssued) noexcept {
   }
 }
 
+/// Whether the token of the file may still be returned: it can have ended since the file was read.
+bool RefreshAttempt::IsStillUsable(const SamlToken &cached) const noexcept {
+  try {
+    return m_assess(cached) != CachedUse::NO;
+  } catch (...) {
+    return false;
+  }
+}
+
 /// A token that the attempt has already is better than the failure.
 void RefreshAttempt::Fail(const std::exception_ptr &failure) noexcept {
   std::shared_ptr<const SamlToken> fallback;
@@ -226,7 +235,7 @@ void RefreshAttempt::Fail(const std::exception_ptr &failure) noexcept {
     fallback = m_fallback;
     isIssued = m_isFallbackIssued;
   }
-  if (fallback) {
+  if (fallback && (isIssued || IsStillUsable(*fallback))) {
     End(fallback, isIssued);
   } else {
     End(failure, false);

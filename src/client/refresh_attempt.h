@@ -72,6 +72,7 @@ private:
   void WriteCache();
   CallOptions MakeCallOptions() const;
   void End(const TokenOutcome &outcome, bool isIssued) noexcept;
+  bool IsStillUsable(const SamlToken &cached) const noexcept;
   void Fail(const std::exception_ptr &failure) noexcept;
   Ended Decide() noexcept;
 

@@ -156,6 +156,16 @@ TEST_F(CachedSource, DoesNotUseATokenOfTheFileThatIsAboutToExpire) {
   EXPECT_THAT(outcomes.Get(), ElementsAre("CommunicationException: down"));
 }
 
+TEST_F(CachedSource, ReportsTheFailureWhenTheTokenOfTheFileHasEndedMeanwhile) {
+  m_first.Provide(Token("first", 1000s));
+  AdvanceBoth(900s);
+  OutcomeList outcomes;
+  m_second.Source().GetAsync({}, CancelToken(), outcomes.MakeCallback());
+  AdvanceBoth(80s);
+  m_second.issuer->Answer(Failure("down"));
+  EXPECT_THAT(outcomes.Get(), ElementsAre("CommunicationException: down"));
+}
+
 TEST_F(CachedSource, RefreshesItsTokenFromTheFile) {
   m_first.Provide(Token("first", 1000s));
   EXPECT_EQ(m_second.Ask(), "first");
