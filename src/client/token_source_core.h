@@ -83,6 +83,7 @@ private:
   void RemoveWaiter(std::uint64_t number) noexcept;
   std::shared_ptr<RefreshAttempt> CreateAttempt(const Moment &now);
   void OnAttemptEnded(std::uint64_t number, const TokenOutcome &outcome, bool isIssued) noexcept;
+  bool QueueChange() noexcept;
   void OnTimer();
   void Update(const Moment &now, bool isNew) noexcept;
   void UpdateTimer(const Moment &now) noexcept;
