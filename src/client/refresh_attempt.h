@@ -62,6 +62,7 @@ private:
 
   std::function<void()> MakeStep(Step step);
   void StartTimer();
+  void ShortenDeadline();
   void OpenCache();
   void LookIntoCache();
   bool UseCached();

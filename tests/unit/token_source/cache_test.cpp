@@ -156,12 +156,28 @@ TEST_F(CachedSource, DoesNotUseATokenOfTheFileThatIsAboutToExpire) {
   EXPECT_THAT(outcomes.Get(), ElementsAre("CommunicationException: down"));
 }
 
-TEST_F(CachedSource, ReportsTheFailureWhenTheTokenOfTheFileHasEndedMeanwhile) {
+TEST_F(CachedSource, UsesADueTokenOfTheFileWhenTheServiceDoesNotAnswerSoon) {
   m_first.Provide(Token("first", 1000s));
-  AdvanceBoth(900s);
+  AdvanceBoth(800s);
   OutcomeList outcomes;
   m_second.Source().GetAsync({}, CancelToken(), outcomes.MakeCallback());
-  AdvanceBoth(80s);
+  AdvanceBoth(2s - 1us);
+  EXPECT_THAT(outcomes.Get(), IsEmpty());
+  AdvanceBoth(1us);
+  EXPECT_THAT(outcomes.Get(), ElementsAre("first"));
+  EXPECT_EQ(m_second.issuer->CountOpen(), 0U) << "the request is cancelled";
+  AdvanceBoth(1s);
+  EXPECT_EQ(m_second.Ask(), "first");
+  AdvanceBoth(20s);
+  EXPECT_EQ(m_second.issuer->CountOpen(), 1U) << "no call waits for the next request, which has more time";
+}
+
+TEST_F(CachedSource, ReportsTheFailureWhenTheTokenOfTheFileHasEndedMeanwhile) {
+  m_first.Provide(Token("first", 1000s));
+  AdvanceBoth(969s);
+  OutcomeList outcomes;
+  m_second.Source().GetAsync({}, CancelToken(), outcomes.MakeCallback());
+  AdvanceBoth(1s);
   m_second.issuer->Answer(Failure("down"));
   EXPECT_THAT(outcomes.Get(), ElementsAre("CommunicationException: down"));
 }
