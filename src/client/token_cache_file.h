@@ -40,9 +40,10 @@ public:
   /// @throws Tarvel::IOException when the file is refused or cannot be made
   std::unique_ptr<Lock> TryLock() const { return m_file.TryLock(); }
 
-  /// The token of this binding, verified again; null when there is none: no file, an empty, truncated or foreign one, another
+  /// The token of this binding, verified again; null when there is none: no file, an empty or truncated one, another version or
   /// binding, a token that is refused now. Needs no lock.
-  /// @throws Tarvel::IOException when the file is refused (a link, another owner, a mode that lets others in) or cannot be read;
+  /// @throws Tarvel::IOException when the file is refused (a link, another owner, a mode that lets others in, or the content of
+  ///         another kind of file, which must not be lost) or cannot be read;
   ///         what `verify` throws, unless it is the refusal of a token
   std::shared_ptr<const SamlToken> Read() const;
 
@@ -55,6 +56,7 @@ public:
   void Remove(Lock &lock, const std::string &tokenId) const;
 
 private:
+  std::string m_path;
   Tarvel::PrivateFile m_file;
   CacheBinding m_binding;
   Verify m_verify;

@@ -47,6 +47,9 @@ struct CachedToken {
 /// @throws std::bad_alloc
 std::string WriteCacheText(const CacheBinding &binding, const SamlToken &token);
 
+/// Whether the text begins as that of a cache file of any version does, as far as it goes. An empty text does.
+bool IsCacheText(std::string_view text) noexcept;
+
 /// The token in the text; nothing if the text is not complete, has another version or another binding.
 /// @param text must exist as long as the result is used
 /// @throws std::bad_alloc
