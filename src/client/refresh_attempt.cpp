@@ -230,9 +230,9 @@ void RefreshAttempt::Cancel() noexcept {
   m_cancel.Cancel();
 }
 
-void RefreshAttempt::End(const TokenOutcome &outcome, bool isIssued) noexcept {
+void RefreshAttempt::End(const TokenOutcome &outcome, bool isIssued, const std::exception_ptr &failure) noexcept {
   if (const Ended ended = Decide()) {
-    ended(outcome, isIssued);
+    ended(outcome, isIssued, failure);
   }
 }
 
@@ -255,7 +255,7 @@ void RefreshAttempt::Fail(const std::exception_ptr &failure) noexcept {
     isIssued = m_isFallbackIssued;
   }
   if (fallback && (isIssued || IsStillUsable(*fallback))) {
-    End(fallback, isIssued);
+    End(fallback, isIssued, failure);
   } else {
     End(failure, false);
   }

@@ -51,7 +51,8 @@ bool RefreshState::OnTimer(const Moment &now, bool isAsked) noexcept {
   return true;
 }
 
-RefreshState::Result RefreshState::OnAttemptEnded(const Moment &now, const TokenOutcome &outcome, bool isIssued) {
+RefreshState::Result RefreshState::OnAttemptEnded(const Moment &now, const TokenOutcome &outcome, bool isIssued,
+                                                  const std::exception_ptr &failure) {
   m_isAttempting = false;
   if (!outcome.HasValue()) {
     return Fail(now, outcome.GetException());
@@ -66,10 +67,11 @@ RefreshState::Result RefreshState::OnAttemptEnded(const Moment &now, const Token
   }
   m_token = token;
   m_times = times;
-  m_failure = nullptr;
   if (!isIssued && times.IsDue(now)) {
     BeginBackOff(now); // the service has failed, or another program asks it
+    m_failure = failure;
   } else {
+    m_failure = nullptr;
     m_failures = 0;
     m_notBefore = SteadyTime::min();
   }

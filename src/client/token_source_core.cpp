@@ -216,12 +216,15 @@ std::shared_ptr<RefreshAttempt> TokenSourceCore::CreateAttempt(const Moment &now
         const std::lock_guard<Tarvel::ForkSafeMutex> lock(self->m_mutex);
         return self->m_state.Assess(then, cached);
       },
-      [self, number](const TokenOutcome &outcome, bool isIssued) { self->OnAttemptEnded(number, outcome, isIssued); });
+      [self, number](const TokenOutcome &outcome, bool isIssued, const std::exception_ptr &failure) {
+        self->OnAttemptEnded(number, outcome, isIssued, failure);
+      });
   m_attempts = number;
   return m_attempt;
 }
 
-void TokenSourceCore::OnAttemptEnded(std::uint64_t number, const TokenOutcome &outcome, bool isIssued) noexcept {
+void TokenSourceCore::OnAttemptEnded(std::uint64_t number, const TokenOutcome &outcome, bool isIssued,
+                                     const std::exception_ptr &failure) noexcept {
   const Moment now = ReadClocks(m_setup.time);
   RefreshState::Result result{outcome, false};
   std::shared_ptr<RefreshAttempt> ended; // destroyed outside the lock, as the calls that waited
@@ -234,7 +237,7 @@ void TokenSourceCore::OnAttemptEnded(std::uint64_t number, const TokenOutcome &o
     }
     ended.swap(m_attempt);
     try {
-      result = m_state.OnAttemptEnded(now, outcome, isIssued);
+      result = m_state.OnAttemptEnded(now, outcome, isIssued, failure);
     } catch (...) {
       m_state.ForgetAttempt();
       result.outcome = std::current_exception();

@@ -156,6 +156,16 @@ TEST_F(CachedSource, DoesNotUseATokenOfTheFileThatIsAboutToExpire) {
   EXPECT_THAT(outcomes.Get(), ElementsAre("CommunicationException: down"));
 }
 
+TEST_F(CachedSource, ReportsTheFailureAtOnceWhenTheDueTokenOfTheFileIsInvalidated) {
+  m_first.Provide(Token("first", 1000s));
+  AdvanceBoth(800s);
+  EXPECT_EQ(m_second.Ask(), "waits");
+  m_second.issuer->Answer(Failure("down"));
+  m_second.Source().Invalidate("first");
+  EXPECT_EQ(m_second.Ask(), "CommunicationException: down");
+  EXPECT_EQ(m_second.issuer->Count(), 1U);
+}
+
 TEST_F(CachedSource, UsesADueTokenOfTheFileWhenTheServiceDoesNotAnswerSoon) {
   m_first.Provide(Token("first", 1000s));
   AdvanceBoth(800s);
