@@ -155,6 +155,14 @@ TEST_F(Token, IsExchangedForAnother) {
   EXPECT_EQ(2, CountIssued());
 }
 
+TEST_F(Token, InExchangeForAnotherTokenOfTheSameSubjectIsAnotherOne) {
+  Acquire("given.xml", IDENTITY);
+  Acquire("other.xml", IDENTITY);
+  const std::string token = Print(Line(std::string(IDENTITY) + "--token given.xml"));
+  EXPECT_NE(token, Print(Line(std::string(IDENTITY) + "--token other.xml")));
+  EXPECT_EQ(4, CountIssued());
+}
+
 TEST_F(Token, IsShownInEachFormat) {
   const std::string token = Print(Line());
   EXPECT_THAT(Run(Line() + "--format text").out, StartsWith("Verified:        yes\n"));
