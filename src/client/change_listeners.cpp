@@ -6,6 +6,7 @@
 
 #include <algorithm>
 #include <mutex>
+#include <utility>
 
 namespace SsoClient {
 
@@ -20,20 +21,14 @@ std::shared_ptr<void> ChangeListeners::Add(Function function) {
   return entry;
 }
 
-void ChangeListeners::Publish(const std::shared_ptr<const SamlToken> &token) {
-  {
-    const std::lock_guard<Tarvel::ForkSafeMutex> lock(m_mutex);
-    for (const Entry &entry : m_entries) {
-      if (!m_isClosed && !entry.expired()) {
-        m_calls.emplace_back(entry, token);
-      }
+bool ChangeListeners::Queue(const std::shared_ptr<const SamlToken> &token) {
+  const std::lock_guard<Tarvel::ForkSafeMutex> lock(m_mutex);
+  for (const Entry &entry : m_entries) {
+    if (!m_isClosed && !entry.expired()) {
+      m_calls.emplace_back(entry, token);
     }
-    if (m_isRunning || m_calls.empty()) {
-      return;
-    }
-    m_isRunning = true;
   }
-  ScheduleNext();
+  return !m_calls.empty() && !std::exchange(m_isRunning, true);
 }
 
 /// Called by the thread that has set `m_isRunning`.

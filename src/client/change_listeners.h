@@ -27,8 +27,13 @@ public:
   /// Registers `function` until the returned object is destroyed.
   std::shared_ptr<void> Add(Function function);
 
-  /// Calls all registered functions with `token`, never in this call unless the executor does so. The caller holds no lock.
-  void Publish(const std::shared_ptr<const SamlToken> &token);
+  /// Queues a call of each registered function with `token`. Calls nothing, so the caller may hold its own lock.
+  /// @return whether the caller must call `ScheduleNext`
+  /// @throws std::bad_alloc
+  bool Queue(const std::shared_ptr<const SamlToken> &token);
+
+  /// Makes the next queued call on the executor. The caller holds no lock.
+  void ScheduleNext() noexcept;
 
   /// Starts no further call. A call that is under way continues.
   void Close() noexcept;
@@ -41,7 +46,6 @@ private:
   using Call = std::pair<Entry, std::shared_ptr<const SamlToken>>;
 
   void RunNext();
-  void ScheduleNext() noexcept;
 
   const Executor m_executor;
   Tarvel::ForkSafeMutex m_mutex; // guards all that follows

@@ -291,8 +291,8 @@ bool ClientOperation::Decide(OperationEnding ending) noexcept {
   return true;
 }
 
-/// Finishes on another thread: neither a thread that cancels nor one that must not block should run the host's code. However many steps of other
-/// operations are queued, the end comes before them.
+/// Finishes on another thread: neither a thread that cancels nor one that must not block should run the host's code. The
+/// item is urgent, so that it does not wait for the queued steps of other operations.
 void ClientOperation::FinishElsewhere() noexcept {
   if (m_waiter) {
     const std::lock_guard<ForkSafeMutex> lock(m_mutex);

@@ -5,6 +5,7 @@
 #include <ssoclient/client/exceptions.h>
 #include <ssoclient/logger.h>
 
+#include <algorithm>
 #include <exception>
 #include <mutex>
 #include <utility>
@@ -15,6 +16,10 @@ namespace {
 
 /// How long an attempt waits before it tries again to lock a file that another program has locked.
 constexpr std::chrono::milliseconds LOCK_STEP{20};
+
+/// How long the service may take if the file has a token that may be returned. A caller must not wait long, or be late,
+/// because a service does not answer that is not needed yet.
+constexpr std::chrono::seconds PATIENCE_WITH_TOKEN{2};
 
 constexpr int LOG_LEVEL_WARNING = 8;
 
@@ -53,7 +58,7 @@ std::function<void()> RefreshAttempt::MakeStep(Step step) {
 }
 
 void RefreshAttempt::StartTimer() {
-  const auto timer = m_supplies->time.StartTimer(m_deadline, [weak = weak_from_this()] {
+  auto timer = m_supplies->time.StartTimer(m_deadline, [weak = weak_from_this()] {
     if (const std::shared_ptr<RefreshAttempt> self = weak.lock()) {
       self->m_cancel.Cancel();
       self->Fail(std::make_exception_ptr(DeadlineExceededException("The deadline passed before the operation ended")));
@@ -62,11 +67,24 @@ void RefreshAttempt::StartTimer() {
   {
     const std::lock_guard<Tarvel::ForkSafeMutex> lock(m_mutex);
     if (m_ended) {
-      m_timer = timer;
+      std::swap(m_timer, timer);
+    }
+  }
+  if (timer) {
+    timer->Cancel();
+  }
+}
+
+/// The attempt ends earlier if it has a token of the file.
+void RefreshAttempt::ShortenDeadline() {
+  {
+    const std::lock_guard<Tarvel::ForkSafeMutex> lock(m_mutex);
+    if (!m_fallback) {
       return;
     }
   }
-  timer->Cancel();
+  m_deadline = std::min(m_deadline, m_supplies->time.GetSteadyTime() + PATIENCE_WITH_TOKEN);
+  StartTimer();
 }
 
 void RefreshAttempt::OpenCache() {
@@ -103,6 +121,7 @@ void RefreshAttempt::LookIntoCache() {
       m_lock.swap(fileLock);
     }
   }
+  ShortenDeadline();
   AskService();
 }
 
@@ -212,9 +231,18 @@ void RefreshAttempt::Cancel() noexcept {
   m_cancel.Cancel();
 }
 
-void RefreshAttempt::End(const TokenOutcome &outcome, bool isIssued) noexcept {
+void RefreshAttempt::End(const TokenOutcome &outcome, bool isIssued, const std::exception_ptr &failure) noexcept {
   if (const Ended ended = Decide()) {
-    ended(outcome, isIssued);
+    ended(outcome, isIssued, failure);
+  }
+}
+
+/// Whether the token of the file may still be returned: it can have ended since the file was read.
+bool RefreshAttempt::IsStillUsable(const SamlToken &cached) const noexcept {
+  try {
+    return m_assess(cached) != CachedUse::NO;
+  } catch (...) {
+    return false;
   }
 }
 
@@ -227,8 +255,8 @@ void RefreshAttempt::Fail(const std::exception_ptr &failure) noexcept {
     fallback = m_fallback;
     isIssued = m_isFallbackIssued;
   }
-  if (fallback) {
-    End(fallback, isIssued);
+  if (fallback && (isIssued || IsStillUsable(*fallback))) {
+    End(fallback, isIssued, failure);
   } else {
     End(failure, false);
   }

@@ -17,6 +17,7 @@
 
 #include <atomic>
 #include <chrono>
+#include <exception>
 #include <functional>
 #include <memory>
 
@@ -41,7 +42,8 @@ class RefreshAttempt : public std::enable_shared_from_this<RefreshAttempt> {
 public:
   using Assess = std::function<CachedUse(const SamlToken &cached)>;
   /// @param isIssued whether the service has issued the token now
-  using Ended = std::function<void(const TokenOutcome &outcome, bool isIssued)>;
+  /// @param failure why it has not, if the token is from the file because the attempt failed; otherwise null
+  using Ended = std::function<void(const TokenOutcome &outcome, bool isIssued, const std::exception_ptr &failure)>;
 
   /// @param renewed the token that is renewed; null to acquire one
   RefreshAttempt(std::shared_ptr<const RefreshSupplies> supplies, std::shared_ptr<const SamlToken> renewed,
@@ -63,6 +65,7 @@ private:
 
   std::function<void()> MakeStep(Step step);
   void StartTimer();
+  void ShortenDeadline();
   void OpenCache();
   void LookIntoCache();
   bool UseCached();
@@ -72,7 +75,8 @@ private:
   void OnIssued(const TokenOutcome &outcome);
   void WriteCache();
   CallOptions MakeCallOptions() const;
-  void End(const TokenOutcome &outcome, bool isIssued) noexcept;
+  void End(const TokenOutcome &outcome, bool isIssued, const std::exception_ptr &failure = nullptr) noexcept;
+  bool IsStillUsable(const SamlToken &cached) const noexcept;
   void Fail(const std::exception_ptr &failure) noexcept;
   Ended Decide() noexcept;
 

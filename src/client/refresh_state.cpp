@@ -51,7 +51,8 @@ bool RefreshState::OnTimer(const Moment &now, bool isAsked) noexcept {
   return true;
 }
 
-RefreshState::Result RefreshState::OnAttemptEnded(const Moment &now, const TokenOutcome &outcome, bool isIssued) {
+RefreshState::Result RefreshState::OnAttemptEnded(const Moment &now, const TokenOutcome &outcome, bool isIssued,
+                                                  const std::exception_ptr &failure) {
   m_isAttempting = false;
   if (!outcome.HasValue()) {
     return Fail(now, outcome.GetException());
@@ -66,9 +67,14 @@ RefreshState::Result RefreshState::OnAttemptEnded(const Moment &now, const Token
   }
   m_token = token;
   m_times = times;
-  m_failures = 0;
-  m_notBefore = SteadyTime::min();
-  m_failure = nullptr;
+  if (!isIssued && times.IsDue(now)) {
+    BeginBackOff(now); // the service has failed, or another program asks it
+    m_failure = failure;
+  } else {
+    m_failure = nullptr;
+    m_failures = 0;
+    m_notBefore = SteadyTime::min();
+  }
   return {outcome, true};
 }
 
@@ -81,11 +87,15 @@ CachedUse RefreshState::Assess(const Moment &now, const SamlToken &cached) const
   return times.IsDue(now) ? CachedUse::DUE : CachedUse::FRESH;
 }
 
-/// @param failure null if the attempt brought a token that is not fresher than the usable one, which stays
-RefreshState::Result RefreshState::Fail(const Moment &now, std::exception_ptr failure) {
+void RefreshState::BeginBackOff(const Moment &now) {
   m_failures = std::min(m_failures + 1, std::numeric_limits<int>::max() - 1);
   m_notBefore =
       now.steady + std::chrono::duration_cast<SteadyTime::duration>(GetBackOff(m_failures, m_options, m_random()));
+}
+
+/// @param failure null if the attempt brought a token that is not fresher than the usable one, which stays
+RefreshState::Result RefreshState::Fail(const Moment &now, std::exception_ptr failure) {
+  BeginBackOff(now);
   m_failure = std::move(failure);
   if (IsUsable(now)) {
     return {m_token, false};

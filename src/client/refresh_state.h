@@ -66,7 +66,9 @@ public:
 
   /// The attempt that was started has ended.
   /// @param isIssued whether the service has issued the token for this attempt; otherwise it is from a file
-  Result OnAttemptEnded(const Moment &now, const TokenOutcome &outcome, bool isIssued);
+  /// @param failure why it has not, if the attempt failed and a due token of the file is used; otherwise null
+  Result OnAttemptEnded(const Moment &now, const TokenOutcome &outcome, bool isIssued,
+                        const std::exception_ptr &failure);
 
   /// How a token of the file cache may be used now.
   CachedUse Assess(const Moment &now, const SamlToken &cached) const;
@@ -101,6 +103,7 @@ public:
 private:
   bool MayAttempt(const Moment &now) const noexcept { return !m_isAttempting && now.steady >= m_notBefore; }
   bool IsUsable(const Moment &now) const noexcept { return m_token && m_times.IsUsable(now); }
+  void BeginBackOff(const Moment &now);
   Result Fail(const Moment &now, std::exception_ptr failure);
   std::exception_ptr FindFault(const SamlToken &token, const RefreshTimes &times, const Moment &now) const;
 
@@ -111,7 +114,7 @@ private:
   bool m_isAttempting = false;
   int m_failures = 0; // attempts in a row that brought no other token
   SteadyTime m_notBefore = SteadyTime::min();
-  std::exception_ptr m_failure; // of the last attempt; null if it brought a token, even if that was not fresher
+  std::exception_ptr m_failure; // of the last attempt; null if it has not failed
   std::deque<std::string> m_invalidated;
 };
 

@@ -5,6 +5,8 @@
 #include "client/token_cache_text.h"
 
 #include <ssoclient/exceptions.h>
+#include <tarvel/core/exception.h>
+#include <tarvel/core/string_util.h>
 #include <tarvel/xml/parser.h>
 
 #include <utility>
@@ -12,10 +14,14 @@
 namespace SsoClient {
 
 TokenCacheFile::TokenCacheFile(std::string path, CacheBinding binding, Verify verify)
-    : m_file(std::move(path)), m_binding(std::move(binding)), m_verify(std::move(verify)) {}
+    : m_path(path), m_file(std::move(path)), m_binding(std::move(binding)), m_verify(std::move(verify)) {}
 
 std::shared_ptr<const SamlToken> TokenCacheFile::Read() const {
   const boost::optional<std::string> text = m_file.Read();
+  // It may be a key or a password that was named by mistake, and must not be replaced.
+  if (text && !IsCacheText(*text)) {
+    throw Tarvel::IOException("Cannot use " + Tarvel::StringUtil::Shorten(m_path) + ": it is not a token cache");
+  }
   const boost::optional<CachedToken> cached = text ? FindCachedToken(*text, m_binding) : boost::none;
   if (!cached) {
     return nullptr;

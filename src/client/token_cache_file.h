@@ -40,10 +40,11 @@ public:
   /// @throws Tarvel::IOException when the file is refused or cannot be made
   std::unique_ptr<Lock> TryLock() const { return m_file.TryLock(); }
 
-  /// The token of this binding, verified again. Null when there is no file, or when the file is empty, truncated or not
-  /// a token cache, has another binding, or has a token that is refused now. Needs no lock.
+  /// The token of this binding, verified again. Null when there is no file, or when the file is empty or truncated, has
+  /// another version or another binding, or has a token that is refused now. Needs no lock.
   /// @throws Tarvel::IOException when the file is refused (a link, another owner, a mode that lets other users read or
-  ///         write it) or cannot be read; what `verify` throws, unless it is the refusal of a token
+  ///         write it, or the content of another kind of file, which must not be lost) or cannot be read; what `verify`
+  ///         throws, unless it is the refusal of a token
   std::shared_ptr<const SamlToken> Read() const;
 
   /// Replaces the content as a whole; readers see the old or the new content.
@@ -56,6 +57,7 @@ public:
   void Remove(Lock &lock, const std::string &tokenId) const;
 
 private:
+  std::string m_path;
   Tarvel::PrivateFile m_file;
   CacheBinding m_binding;
   Verify m_verify;

@@ -8,6 +8,7 @@ namespace SsoClient {
 
 namespace {
 
+constexpr std::string_view FORMAT_NAME = "ssoclient token cache ";
 constexpr std::string_view VERSION_LINE = "ssoclient token cache 1\n";
 constexpr std::string_view TOKEN_LINE = "token: ";
 constexpr std::string_view END_LINE = "end: ";
@@ -89,6 +90,11 @@ std::string CacheValue(std::string_view value) {
     written.append("\\x").append(1, DIGITS[octet / 16]).append(1, DIGITS[octet % 16]);
   }
   return written;
+}
+
+bool IsCacheText(std::string_view text) noexcept {
+  const std::size_t compared = std::min(text.size(), FORMAT_NAME.size());
+  return text.substr(0, compared) == FORMAT_NAME.substr(0, compared);
 }
 
 std::string WriteCacheText(const CacheBinding &binding, const SamlToken &token) {

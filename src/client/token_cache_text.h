@@ -48,6 +48,9 @@ struct CachedToken {
 /// @throws std::bad_alloc
 std::string WriteCacheText(const CacheBinding &binding, const SamlToken &token);
 
+/// Whether the text begins like that of a cache file of any version, as far as it reaches. An empty text does.
+bool IsCacheText(std::string_view text) noexcept;
+
 /// The token in the text; `boost::none` if the text is not complete, or has another version or another binding.
 /// @param text must exist as long as the result is used
 /// @throws std::bad_alloc

@@ -216,16 +216,20 @@ std::shared_ptr<RefreshAttempt> TokenSourceCore::CreateAttempt(const Moment &now
         const std::lock_guard<Tarvel::ForkSafeMutex> lock(self->m_mutex);
         return self->m_state.Assess(then, cached);
       },
-      [self, number](const TokenOutcome &outcome, bool isIssued) { self->OnAttemptEnded(number, outcome, isIssued); });
+      [self, number](const TokenOutcome &outcome, bool isIssued, const std::exception_ptr &failure) {
+        self->OnAttemptEnded(number, outcome, isIssued, failure);
+      });
   m_attempts = number;
   return m_attempt;
 }
 
-void TokenSourceCore::OnAttemptEnded(std::uint64_t number, const TokenOutcome &outcome, bool isIssued) noexcept {
+void TokenSourceCore::OnAttemptEnded(std::uint64_t number, const TokenOutcome &outcome, bool isIssued,
+                                     const std::exception_ptr &failure) noexcept {
   const Moment now = ReadClocks(m_setup.time);
   RefreshState::Result result{outcome, false};
   std::shared_ptr<RefreshAttempt> ended; // destroyed outside the lock, like the calls that waited
   Waiters waiters;
+  bool isListened = false;
   {
     const std::lock_guard<Tarvel::ForkSafeMutex> lock(m_mutex);
     if (m_isClosed || number != m_attempts || m_generation != Tarvel::GetForkGeneration()) {
@@ -233,7 +237,7 @@ void TokenSourceCore::OnAttemptEnded(std::uint64_t number, const TokenOutcome &o
     }
     ended.swap(m_attempt);
     try {
-      result = m_state.OnAttemptEnded(now, outcome, isIssued);
+      result = m_state.OnAttemptEnded(now, outcome, isIssued, failure);
     } catch (...) {
       m_state.ForgetAttempt();
       result.outcome = std::current_exception();
@@ -241,17 +245,23 @@ void TokenSourceCore::OnAttemptEnded(std::uint64_t number, const TokenOutcome &o
     m_isAsked.store(false, std::memory_order_relaxed);
     waiters.swap(m_waiters);
     Update(now, result.isNew);
+    isListened = result.isNew && QueueChange();
   }
   for (const auto &waiter : waiters) {
     waiter.second->Deliver(result.outcome);
   }
-  if (result.isNew) {
-    try {
-      m_listeners->Publish(result.outcome.Get());
-    } catch (...) {
-      // No memory: the functions are not called with this token.
-      return;
-    }
+  if (isListened) {
+    m_listeners->ScheduleNext();
+  }
+}
+
+/// Queues the calls for the present token. Called under the lock: a callback of this one may already get the next token.
+/// @return whether they must be scheduled, without the lock
+bool TokenSourceCore::QueueChange() noexcept {
+  try {
+    return m_listeners->Queue(m_state.GetToken());
+  } catch (...) {
+    return false; // no memory: the functions are not called with this token
   }
 }
 

@@ -82,7 +82,9 @@ private:
                                     std::shared_ptr<RefreshAttempt> &attempt);
   void RemoveWaiter(std::uint64_t number) noexcept;
   std::shared_ptr<RefreshAttempt> CreateAttempt(const Moment &now);
-  void OnAttemptEnded(std::uint64_t number, const TokenOutcome &outcome, bool isIssued) noexcept;
+  void OnAttemptEnded(std::uint64_t number, const TokenOutcome &outcome, bool isIssued,
+                      const std::exception_ptr &failure) noexcept;
+  bool QueueChange() noexcept;
   void OnTimer();
   void Update(const Moment &now, bool isNew) noexcept;
   void UpdateTimer(const Moment &now) noexcept;

@@ -40,8 +40,9 @@ std::string OwnerOf(const CredentialsOptions &credentials, const boost::optional
                     const boost::optional<HolderOfKeyConfig> &identity) {
   std::string owner = credentials.user + credentials.gss.client;
   if (const auto *const exchanged = given ? std::get_if<TokenCredential>(&given->credential) : nullptr) {
+    // Two tokens of one subject may differ in what they allow, and so do those that are issued for them.
     const PrincipalId &subject = exchanged->token->GetSubject();
-    owner = "in exchange: " + subject.name + "@" + subject.domain;
+    owner = "in exchange: " + subject.name + "@" + subject.domain + ", " + exchanged->token->GetId();
   }
   return identity && !owner.empty() ? owner + ", certificate:" + identity->certificate->GetSha256Thumbprint() : owner;
 }

@@ -93,8 +93,9 @@ TEST_F(SharedCache, ThatIsDamagedIsReplacedAfterOneRequest) {
   ASSERT_EQ(GetToken(), "token");
   const std::string whole = m_folder.Read("token");
   int requests = 1;
-  for (const std::string &content : {std::string(), whole.substr(0, whole.size() / 2), std::string("foreign\n"),
-                                     std::string(whole).replace(whole.find("alice@"), 6, "admin@")}) {
+  for (const std::string &content :
+       {std::string(), whole.substr(0, whole.size() / 2), std::string("ssoclient token cache 2\n"),
+        std::string(whole).replace(whole.find("alice@"), 6, "admin@")}) {
     m_folder.Write("token", content);
     EXPECT_EQ(GetToken(), "token") << content;
     EXPECT_EQ(m_service.GetServer().GetConnectionCount(), ++requests) << content;
@@ -115,6 +116,14 @@ TEST_F(SharedCache, ThatIsRefusedEndsTheCallWithoutARequest) {
   ASSERT_EQ(::symlink("elsewhere", m_path.c_str()), 0);
   EXPECT_TRUE(Eventually([&] { return outcome() == "IOException: Cannot use " + m_path + ": it is a symbolic link"; }));
   EXPECT_EQ(m_service.GetServer().GetConnectionCount(), 0);
+
+  ASSERT_EQ(::unlink(m_path.c_str()), 0);
+  m_folder.Write("token", "foreign\n");
+  ASSERT_EQ(::chmod(m_path.c_str(), 0600), 0);
+  EXPECT_TRUE(
+      Eventually([&] { return outcome() == "IOException: Cannot use " + m_path + ": it is not a token cache"; }));
+  EXPECT_EQ(m_service.GetServer().GetConnectionCount(), 0);
+  EXPECT_EQ(m_folder.Read("token"), "foreign\n");
 
   ASSERT_EQ(::unlink(m_path.c_str()), 0);
   EXPECT_TRUE(Eventually([&] { return outcome() == "token"; }));

@@ -155,6 +155,14 @@ TEST_F(Token, IsExchangedForAnother) {
   EXPECT_EQ(2, CountIssued());
 }
 
+TEST_F(Token, InExchangeForAnotherTokenOfTheSameSubjectIsAnotherOne) {
+  Acquire("given.xml", IDENTITY);
+  Acquire("other.xml", IDENTITY);
+  const std::string token = Print(Line(std::string(IDENTITY) + "--token given.xml"));
+  EXPECT_NE(token, Print(Line(std::string(IDENTITY) + "--token other.xml")));
+  EXPECT_EQ(4, CountIssued());
+}
+
 TEST_F(Token, IsShownInEachFormat) {
   const std::string token = Print(Line());
   EXPECT_THAT(Run(Line() + "--format text").out, StartsWith("Verified:        yes\n"));
@@ -214,11 +222,19 @@ TEST_F(Token, IsPrintedWithAWarningWhenItCannotBeKept) {
 TEST_F(Token, ReplacesACacheThatIsDamaged) {
   const std::string token = Print(Line());
   const std::string whole = m_folder.Read("alice.cache");
-  for (const std::string &content : {whole.substr(0, whole.size() / 2), std::string("what is this"), std::string()}) {
+  for (const std::string &content :
+       {whole.substr(0, whole.size() / 2), std::string("ssoclient token cache 2\n"), std::string()}) {
     m_folder.Write("alice.cache", content);
     EXPECT_NE(token, Print(Line()));
   }
   EXPECT_EQ(4, CountIssued());
+}
+
+TEST_F(Token, IsNotKeptInAFileOfAnotherKind) {
+  std::filesystem::copy_file(m_folder / "client.key", m_folder / "alice.cache");
+  chmod((m_folder / "alice.cache").c_str(), 0600);
+  ExpectCacheRefused("it is not a token cache");
+  EXPECT_EQ(m_folder.Read("client.key"), m_folder.Read("alice.cache"));
 }
 
 TEST_F(Token, ReportsWhyTheServiceRefusesIt) {

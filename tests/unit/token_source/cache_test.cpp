@@ -135,11 +135,59 @@ TEST_F(CachedSource, UsesADueTokenOfTheFileWhenTheServiceFails) {
   EXPECT_THAT(outcomes.Get(), ElementsAre("first"));
 }
 
+TEST_F(CachedSource, WaitsForTheBackOffWhenItUsesADueTokenBecauseTheServiceFails) {
+  m_first.Provide(Token("first", 1000s));
+  AdvanceBoth(800s);
+  EXPECT_EQ(m_second.Ask(), "waits");
+  m_second.issuer->Answer(Failure("down"));
+  m_second.time.Advance(1s - 1us);
+  EXPECT_EQ(m_second.Ask(), "first");
+  EXPECT_EQ(m_second.issuer->Count(), 1U);
+  m_second.time.Advance(1us);
+  EXPECT_EQ(m_second.issuer->Count(), 2U) << "a call has asked since";
+}
+
 TEST_F(CachedSource, DoesNotUseATokenOfTheFileThatIsAboutToExpire) {
   m_first.Provide(Token("first", 1000s));
   AdvanceBoth(970s);
   OutcomeList outcomes;
   m_second.Source().GetAsync({}, CancelToken(), outcomes.MakeCallback());
+  m_second.issuer->Answer(Failure("down"));
+  EXPECT_THAT(outcomes.Get(), ElementsAre("CommunicationException: down"));
+}
+
+TEST_F(CachedSource, ReportsTheFailureAtOnceWhenTheDueTokenOfTheFileIsInvalidated) {
+  m_first.Provide(Token("first", 1000s));
+  AdvanceBoth(800s);
+  EXPECT_EQ(m_second.Ask(), "waits");
+  m_second.issuer->Answer(Failure("down"));
+  m_second.Source().Invalidate("first");
+  EXPECT_EQ(m_second.Ask(), "CommunicationException: down");
+  EXPECT_EQ(m_second.issuer->Count(), 1U);
+}
+
+TEST_F(CachedSource, UsesADueTokenOfTheFileWhenTheServiceDoesNotAnswerSoon) {
+  m_first.Provide(Token("first", 1000s));
+  AdvanceBoth(800s);
+  OutcomeList outcomes;
+  m_second.Source().GetAsync({}, CancelToken(), outcomes.MakeCallback());
+  AdvanceBoth(2s - 1us);
+  EXPECT_THAT(outcomes.Get(), IsEmpty());
+  AdvanceBoth(1us);
+  EXPECT_THAT(outcomes.Get(), ElementsAre("first"));
+  EXPECT_EQ(m_second.issuer->CountOpen(), 0U) << "the request is cancelled";
+  AdvanceBoth(1s);
+  EXPECT_EQ(m_second.Ask(), "first");
+  AdvanceBoth(20s);
+  EXPECT_EQ(m_second.issuer->CountOpen(), 1U) << "no call waits for the next request, which has more time";
+}
+
+TEST_F(CachedSource, ReportsTheFailureWhenTheTokenOfTheFileHasEndedMeanwhile) {
+  m_first.Provide(Token("first", 1000s));
+  AdvanceBoth(969s);
+  OutcomeList outcomes;
+  m_second.Source().GetAsync({}, CancelToken(), outcomes.MakeCallback());
+  AdvanceBoth(1s);
   m_second.issuer->Answer(Failure("down"));
   EXPECT_THAT(outcomes.Get(), ElementsAre("CommunicationException: down"));
 }

@@ -306,6 +306,18 @@ TEST(TokenSourceOnChange, CallsTheFunctionsInOrderWithEachNewToken) {
   EXPECT_THAT(calls, ElementsAre("a first", "b first", "a second"));
 }
 
+TEST(TokenSourceOnChange, KeepsTheOrderIfACallbackGetsTheNextToken) {
+  SourceStage stage;
+  std::vector<std::string> calls;
+  const auto registration = stage.Source().OnChange([&](const auto &token) { calls.push_back(token->GetId()); });
+  stage.Source().GetAsync({}, CancelToken(), [&](const TokenOutcome &outcome) {
+    stage.Source().Invalidate(outcome.Get()->GetId());
+    stage.Provide(stage.Token("second", 1000s));
+  });
+  stage.issuer->Answer(stage.Token("first", 1000s));
+  EXPECT_THAT(calls, ElementsAre("first", "second"));
+}
+
 TEST(TokenSourceOnChange, CallsNothingForATokenThatIsNotFresher) {
   SourceStage stage;
   int calls = 0;
