@@ -20,8 +20,8 @@ namespace SsoClient {
 
 /// When an operation is tried again. By default it never is.
 ///
-/// Only a request that the service cannot have acted upon is repeated. Either no connection was made for it, or the
-/// service answered it with the status 503 and a header `Retry-After`. After such an answer, the policy waits as long
+/// Only a request that the service cannot have acted upon is repeated. Either no connection was made for it (or the TLS
+/// handshake failed), or the service answered it with the status 503 and a header `Retry-After`. After such an answer, the policy waits as long
 /// as the service demands. An operation is not tried again when its deadline would pass during the wait. The operation
 /// then ends at once with the failure of the last attempt.
 ///
@@ -56,7 +56,8 @@ struct CallOptions {
   /// How the returned token is verified, in place of the client's options.
   boost::optional<VerifyOptions> verifyOptions;
 
-  /// Where the callback runs, in place of the client's executor; empty for the client's. A call that waits does not use it.
+  /// Where the callback runs, in place of the client's executor; empty for the client's. Calls that wait and
+  /// futures do not use it.
   Executor executor;
 
   /// The policy in place of the client's.

@@ -9,7 +9,8 @@
 namespace SsoClient {
 
 /// Any callable that runs a function once, now or later, on a thread of its choice: for example one that posts the function to
-/// an event loop. It is called on threads of the library, so it must be safe on any thread and must not block.
+/// an event loop. It is called on threads of the library, or on the thread that cancels, so it must be safe on any thread and must not
+/// block.
 ///
 /// An executor refuses a function by throwing, or by destroying it without having run it. The function then runs on a
 /// thread of the library, because each operation must end with exactly one outcome. What an executor throws is logged.

@@ -45,7 +45,7 @@ class ClientIssuer;
 /// - with a callback (`AcquireAsync`), the call returns at once, and the callback is called exactly once with the
 ///   outcome, on the executor of the call or of the client. Without an executor, it runs on one of the library's own
 ///   threads (at most four), where it must not block. It is never called within the call that starts the operation,
-///   unless no thread can be started. What a callback throws is logged (logger "SsoClient", level 8) and changes
+///   unless its outcome is known at the start and no thread can be started. What a callback throws is logged (logger "SsoClient", level 8) and changes
 ///   nothing else;
 /// - as a future (`AcquireFuture`), which becomes ready on a thread of the library. Destroying the future neither waits nor
 ///   cancels;
@@ -63,7 +63,7 @@ class ClientIssuer;
 ///
 /// A cancelled or late operation ends at once, and closes its connection. Work that cannot be interrupted (looking up a
 /// name, a leg of a negotiation handler, the verification of a token) continues on a thread of the library, and has no
-/// effect. If a token is cancelled, or a deadline has passed, when an operation starts, nothing is composed or sent.
+/// effect, except that the sink of refused tokens may still be called. If a token is cancelled, or a deadline has passed, when an operation starts, nothing is composed or sent.
 ///
 /// A function that starts an operation throws only what keeps it from starting: `Tarvel::InvalidArgumentException` for a null
 /// callback, `Tarvel::InvalidStateException` when no thread can be started, and `std::bad_alloc`. The callback is not called
