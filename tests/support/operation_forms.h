@@ -6,6 +6,7 @@
 #pragma once
 
 #include "support/completion.h"
+#include "support/kept_exception.h"
 
 #include <ssoclient/client/token_client.h>
 #include <ssoclient/client/token_source.h>
@@ -42,7 +43,12 @@ Value Await(std::future<Value> future) {
   if (future.wait_for(PATIENCE) != std::future_status::ready) {
     throw std::runtime_error("no outcome");
   }
-  return future.get();
+  try {
+    return future.get();
+  } catch (...) {
+    KeepForThreadSanitizer(std::current_exception());
+    throw;
+  }
 }
 
 /// A callback that fulfils `promise`; a second call throws std::future_error.

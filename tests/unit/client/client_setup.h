@@ -8,6 +8,7 @@
 #include "scripted_transport.h"
 #include "support/data_file.h"
 #include "support/exception_class.h"
+#include "support/kept_exception.h"
 #include "support/process_resources.h"
 #include "support/rendezvous.h"
 #include "support/service_stand_ins.h"
@@ -72,6 +73,7 @@ inline SsoClient::PasswordCredential Alice() {
 
 /// "CLASS: MESSAGE" of an exception.
 inline std::string Describe(const std::exception_ptr &failure) {
+  KeepForThreadSanitizer(failure);
   try {
     std::rethrow_exception(failure);
   } catch (const std::exception &exception) {

@@ -95,10 +95,11 @@ TEST_F(LoopbackClient, EndsACancelledOperationAndClosesTheConnection) {
   const CancelSource source;
   CallOptions options;
   options.cancelToken = source.GetToken();
-  auto future = client->AcquireFuture(Alice(), SpecFor(60), options);
+  const Outcomes outcomes;
+  client->AcquireAsync(Alice(), SpecFor(60), options, outcomes.Record());
   EXPECT_TRUE(Testing::Eventually([&] { return stalling.GetOpenCount() == 1; }));
   source.Cancel();
-  EXPECT_EQ(EndOf([&] { future.get(); }), Testing::CANCELLED);
+  EXPECT_EQ(outcomes.Wait(), Strings{Testing::CANCELLED});
   EXPECT_TRUE(Testing::Eventually([&] { return stalling.GetOpenCount() == 0; }));
 }
 
