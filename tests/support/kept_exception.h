@@ -4,9 +4,10 @@
 
 #pragma once
 
+#include <cstddef>
+#include <deque>
 #include <exception>
 #include <mutex>
-#include <vector>
 
 #if defined(__has_feature)
 #if __has_feature(thread_sanitizer)
@@ -19,14 +20,19 @@
 
 namespace Testing {
 
-/// Keeps `exception` until the process ends, if ThreadSanitizer is on: the standard library is compiled without it, so it
-/// does not see how that library counts the owners of an exception, and would report its destruction as a race.
+/// Keeps `exception`, if ThreadSanitizer is on, until a thousand later ones have been kept: the standard library is
+/// compiled without ThreadSanitizer, which therefore does not see how that library counts the owners of an exception, and
+/// would report its destruction as a race. Here, a mutex orders the destruction after the use.
 inline void KeepForThreadSanitizer([[maybe_unused]] const std::exception_ptr &exception) {
 #ifdef TESTING_KEEPS_EXCEPTIONS
   static std::mutex *const mutex = new std::mutex;
-  static std::vector<std::exception_ptr> *const kept = new std::vector<std::exception_ptr>;
+  static std::deque<std::exception_ptr> *const kept = new std::deque<std::exception_ptr>;
+  constexpr std::size_t COUNT = 1'000;
   const std::lock_guard<std::mutex> lock(*mutex);
   kept->push_back(exception);
+  if (kept->size() > COUNT) {
+    kept->pop_front();
+  }
 #endif
 }
 

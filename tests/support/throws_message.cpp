@@ -2,11 +2,14 @@
 
 #include "support/throws_message.h"
 
+#include "support/kept_exception.h"
+
 #include <exception>
 
 namespace Testing {
 
 ::testing::AssertionResult JudgeThrown(const std::type_info &expected, const std::string &message) {
+  KeepForThreadSanitizer(std::current_exception());
   try {
     throw;
   } catch (const std::exception &thrown) {
