@@ -18,6 +18,7 @@
 #include <mutex>
 #include <string>
 #include <thread>
+#include <unistd.h>
 
 namespace {
 
@@ -100,6 +101,9 @@ int main() {
         try {
           GetClient()->Acquire(Password(), Spec());
         } catch (const SsoClient::CommunicationException &) { // the process ends; NOLINT(bugprone-empty-catch)
+        }
+        for (;;) {
+          pause(); // a thread that ended now would release its data of OpenSSL while OpenSSL releases its own
         }
       }).detach();
     }
