@@ -223,6 +223,9 @@ public:
   /// @throws InvalidStateException when `child` already is the child of an element.
   void AppendChild(Node *child);
 
+  /// Makes `child` the first child, by the rules of `AppendChild`.
+  void PrependChild(Node *child);
+
   /// Makes a new element the last child. It is made in the memory of this element's tree, so that it costs no allocation of
   /// its own, and lives as long as the tree.
   /// @throws InvalidArgumentException when prefix or local name is not a name without a colon (NCName).

@@ -1,0 +1,48 @@
+// SPDX-License-Identifier: Apache-2.0
+/// @file
+/// `ReplayGuard`, which remembers the messages that a service has accepted, so that no message is accepted twice.
+
+#pragma once
+
+#include <ssoclient/export.h>
+#include <tarvel/system/date_time.h>
+
+#include <array>
+#include <cstddef>
+#include <cstdint>
+#include <memory>
+
+namespace SsoClient {
+
+/// Identifies a signed message: SHA-256 over what was signed, in canonical form, and over the thumbprint of the key. The
+/// signature's value is not part of it, because some algorithms have several valid values for one message. Not secret.
+using MessageIdentifier = std::array<std::uint8_t, 32>;
+
+/// Remembers messages. An implementation may be called on any number of threads at once.
+class SSOCLIENT_API ReplayGuard {
+public:
+  /// The answer to a message.
+  enum class Answer : std::int32_t {
+    FIRST = 0,  ///< it was not known, and is remembered now
+    REPEATED,   ///< it is known
+    UNAVAILABLE ///< the guard is full or cannot be reached; the message is not remembered
+  };
+
+  /// Remembers the message, at least until `until`, and answers whether it was known. Both happen in one step: of several
+  /// calls with one identifier at the same time, one is answered FIRST. It may block, for example on the network.
+  /// What it throws is reported as UNAVAILABLE.
+  virtual Answer Remember(const MessageIdentifier &identifier, const Tarvel::System::DateTime &until) = 0;
+
+protected:
+  ReplayGuard() = default;
+  ReplayGuard(const ReplayGuard &) = default;
+  ReplayGuard &operator=(const ReplayGuard &) = default;
+  ~ReplayGuard() = default;
+};
+
+/// A guard in the memory of this process. It remembers at most `capacity` messages that have not expired, and answers
+/// UNAVAILABLE to more. It takes at most TODO bytes for each, all of them from the beginning.
+/// @throws Tarvel::InvalidArgumentException when `capacity` is 0 or more than TODO. @throws std::bad_alloc
+SSOCLIENT_API std::shared_ptr<ReplayGuard> CreateMemoryReplayGuard(std::size_t capacity);
+
+} // namespace SsoClient

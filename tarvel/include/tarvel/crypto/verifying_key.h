@@ -1,0 +1,56 @@
+// SPDX-License-Identifier: Apache-2.0
+/// @file
+/// Public keys that are prepared for the verification of signatures.
+
+#pragma once
+
+#include <tarvel/core/export.h>
+#include <tarvel/core/ref.h>
+#include <tarvel/crypto/certificate.h>
+#include <tarvel/crypto/private_key.h>
+
+#include <cstdint>
+#include <string>
+#include <vector>
+
+namespace Tarvel::Crypto {
+
+/// A public key, with or without a certificate. Immutable; safe on any thread.
+class TARVEL_API VerifyingKey : public Object {
+public:
+  /// SubjectPublicKeyInfo in DER (RFC 5280, section 4.1.2.7); owned by the key.
+  virtual const std::vector<std::uint8_t> &GetSubjectPublicKey() const noexcept = 0;
+
+  /// "RSA", "EC", or empty for every other kind of key.
+  virtual std::string GetAlgorithm() const = 0;
+
+  /// Size of the modulus or of the curve's order, in bits; 0 for other kinds of keys.
+  virtual unsigned GetBits() const noexcept = 0;
+
+  /// Why no signature by this key is accepted: empty for RSA keys of at least 2048 bits with a sound exponent, and for
+  /// keys on the curves P-256, P-384 and P-521.
+  virtual std::string GetRefusal() const = 0;
+
+  /// SHA-256 over `GetSubjectPublicKey`, 64 lower-case hexadecimal digits.
+  virtual std::string GetSha256Thumbprint() const = 0;
+
+protected:
+  ~VerifyingKey() override;
+};
+
+/// The key with this SubjectPublicKeyInfo, in DER.
+/// @throws CryptoException when it cannot be decoded, or further bytes follow it.
+TARVEL_API Ref<const VerifyingKey> CreateVerifyingKey(const std::vector<std::uint8_t> &subjectPublicKeyInfo);
+
+/// The key of `certificate`, which must not be null. It shares what the certificate has prepared.
+/// @throws TypeMismatchException for a certificate that this library has not made; CryptoException when OpenSSL fails.
+TARVEL_API Ref<const VerifyingKey> CreateVerifyingKey(const Ref<const Certificate> &certificate);
+
+/// The public key that belongs to `key`. Works for keys that cannot be exported, too.
+/// @throws TypeMismatchException for a key that this library has not made; CryptoException when OpenSSL fails.
+TARVEL_API Ref<const VerifyingKey> CreateVerifyingKey(const PrivateKey &key);
+
+/// Whether both are the same key. Keys are compared, not their encodings.
+TARVEL_API bool IsSameKey(const VerifyingKey &left, const VerifyingKey &right);
+
+} // namespace Tarvel::Crypto
