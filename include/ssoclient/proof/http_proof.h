@@ -30,10 +30,10 @@ struct HttpProofOptions {
 
 /// An accepted request.
 struct VerifiedHttpRequest {
-  std::shared_ptr<const SamlToken> token;                  ///< never null
-  ProofKind proof = ProofKind::MESSAGE_SIGNATURE;          ///< what the sender proved
-  std::vector<std::string> covered;                        ///< the covered components, such as "@method", in their order
-  Tarvel::System::DateTime created;                        ///< when the request was signed
+  std::shared_ptr<const SamlToken> token;         ///< never null
+  ProofKind proof = ProofKind::MESSAGE_SIGNATURE; ///< what the sender proved
+  std::vector<std::string> covered;               ///< the covered components, such as "@method", in their order
+  Tarvel::System::DateTime created;               ///< when the request was signed
   ReplayProtection replay = ReplayProtection::NOT_GUARDED; ///< whether a replay guard has accepted the request
 };
 

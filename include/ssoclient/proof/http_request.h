@@ -33,10 +33,10 @@ struct TokenHeader {
     BASE64URL   ///< RFC 4648, section 5, without padding
   };
 
-  std::string name = "Authorization";    ///< of the field
-  std::string before = "SAML ";          ///< before the encoded token; compared byte for byte
-  std::string after;                     ///< after the encoded token; compared byte for byte
-  Encoding encoding = Encoding::BASE64;  ///< of the token
+  std::string name = "Authorization";   ///< of the field
+  std::string before = "SAML ";         ///< before the encoded token; compared byte for byte
+  std::string after;                    ///< after the encoded token; compared byte for byte
+  Encoding encoding = Encoding::BASE64; ///< of the token
 };
 
 } // namespace SsoClient

@@ -31,17 +31,17 @@ struct MessageReport {
 
   /// One check.
   struct CheckResult {
-    Check check = Check::WELL_FORMED;                                  ///< which check
-    TokenReport::Outcome outcome = TokenReport::Outcome::NOT_DONE;     ///< its outcome
-    std::string summary;                                               ///< what was checked and found, in one sentence
-    std::vector<TokenReport::Finding> findings;                        ///< the reasons, if it failed
+    Check check = Check::WELL_FORMED;                              ///< which check
+    TokenReport::Outcome outcome = TokenReport::Outcome::NOT_DONE; ///< its outcome
+    std::string summary;                                           ///< what was checked and found, in one sentence
+    std::vector<TokenReport::Finding> findings;                    ///< the reasons, if it failed
   };
 
-  bool accepted = false;                ///< whether `Verify` would accept the message, apart from the replay guard
-  std::string refusal;                  ///< the text of the exception that `Verify` throws; empty if accepted
-  std::vector<CheckResult> checks;      ///< all checks, in order
-  boost::optional<TokenReport> token;   ///< the report of the token, if there is one
-  std::vector<std::string> covered;     ///< the paths of the elements that the proof covers
+  bool accepted = false;              ///< whether `Verify` would accept the message, apart from the replay guard
+  std::string refusal;                ///< the text of the exception that `Verify` throws; empty if accepted
+  std::vector<CheckResult> checks;    ///< all checks, in order
+  boost::optional<TokenReport> token; ///< the report of the token, if there is one
+  std::vector<std::string> covered;   ///< the paths of the elements that the proof covers
 };
 
 /// The name of a check in lower case with hyphens, such as "security-header".

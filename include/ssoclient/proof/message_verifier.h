@@ -57,13 +57,13 @@ struct VerifiedMessage {
     std::string path;                                  ///< such as "/soapenv:Envelope/soapenv:Body"
   };
 
-  std::shared_ptr<const SamlToken> token;               ///< never null
-  ProofKind proof = ProofKind::BEARER;                  ///< what the sender proved
-  Tarvel::Ref<const Tarvel::Xml::Document> document;    ///< the message that was verified; read the message from here
-  const Tarvel::Xml::ElementNode *body = nullptr;       ///< the SOAP body, of `document`; never null
-  std::vector<CoveredElement> covered;                  ///< in document order; empty without a message signature
-  boost::optional<Tarvel::System::DateTime> created;    ///< of the timestamp
-  boost::optional<Tarvel::System::DateTime> expires;    ///< of the timestamp
+  std::shared_ptr<const SamlToken> token;            ///< never null
+  ProofKind proof = ProofKind::BEARER;               ///< what the sender proved
+  Tarvel::Ref<const Tarvel::Xml::Document> document; ///< the message that was verified; read the message from here
+  const Tarvel::Xml::ElementNode *body = nullptr;    ///< the SOAP body, of `document`; never null
+  std::vector<CoveredElement> covered;               ///< in document order; empty without a message signature
+  boost::optional<Tarvel::System::DateTime> created; ///< of the timestamp
+  boost::optional<Tarvel::System::DateTime> expires; ///< of the timestamp
   ReplayProtection replay = ReplayProtection::NOT_GUARDED; ///< whether a replay guard has accepted the message
 
   /// Whether `element`, which must be of `document`, is one of the covered elements or inside one of them.

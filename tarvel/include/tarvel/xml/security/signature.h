@@ -7,7 +7,6 @@
 #include <tarvel/core/export.h>
 #include <tarvel/core/ref.h>
 #include <tarvel/crypto/private_key.h>
-#include <tarvel/crypto/verifying_key.h>
 #include <tarvel/xml/node.h>
 #include <tarvel/xml/security/exceptions.h>
 #include <tarvel/xml/security/key_info_resolver.h>
@@ -58,22 +57,6 @@ public:
   /// @throws XmlSecurityException for an algorithm outside the profile, a reference that does not resolve to exactly one
   ///         node, a tree without a canonical form, or when no candidate key can be used with the signature's algorithm.
   virtual bool Verify(const KeyInfoResolver &resolver, std::set<std::string> &signedUris) const = 0;
-
-  /// What a signature covers, after its verification.
-  struct Coverage {
-    /// The node that each reference resolves to, in the order of the references. The octets that were signed are the
-    /// canonical form of the whole node, without the signature itself if `omitsSignature` is set for it.
-    struct Target {
-      const Node *node = nullptr;   ///< never null; of the signature's tree
-      bool omitsSignature = false;  ///< the reference has the enveloped-signature transform
-    };
-    std::vector<Target> targets;
-    std::vector<std::uint8_t> signedInfoDigest; ///< the digest of the canonical `SignedInfo`, which the value signs
-  };
-
-  /// The same checks with one key, which need not have a certificate. Nothing in the signature's `KeyInfo` is read.
-  /// @param coverage is set if the result is true; otherwise it is unchanged.
-  virtual bool Verify(const Crypto::VerifyingKey &key, Coverage &coverage) const = 0;
 
   /// Adds a reference to be signed, with one transform.
   /// @throws XmlSecurityException for a transform other than exclusive canonicalisation without comments, or a digest other
