@@ -181,6 +181,9 @@ void CheckParts(const MessageRules &rules, const CheckedMessage &message) {
   if (message.timestamp.element) {
     RequireCovered(*message.timestamp.element, "timestamp", message, sink);
   }
+  if (rules.options.requireTokenCovered && message.assertion) {
+    RequireCovered(*message.assertion, "token", message, sink);
+  }
   for (const MessagePart &part : rules.options.requiredParts) {
     CheckPart(part, message, sink);
   }

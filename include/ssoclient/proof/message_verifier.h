@@ -36,6 +36,10 @@ struct MessageVerifierOptions {
   /// exactly once. Nothing is covered without a signature: then they only must be there.
   std::vector<MessagePart> requiredParts;
 
+  /// Whether the signature must cover the token. Set it if all senders sign the token, as `SignMessage` does. Without it, an
+  /// attacker with two tokens of the same key can put one of them into a message that was signed with the other.
+  bool requireTokenCovered = false;
+
   /// Whether a bearer token without a proof is accepted. A holder-of-key token always needs a proof.
   bool acceptBearer = false;
 
