@@ -11,6 +11,7 @@
 #include "xml/refuse.h"
 
 #include <tarvel/core/string_util.h>
+#include <tarvel/xml/security/exceptions.h>
 
 #include <string>
 
@@ -149,6 +150,15 @@ void FindToken(const MessageRules &rules, CheckedMessage &message) {
            "The security header has no SAML 2.0 token");
   } else if (found.second) {
     Refuse(rules.sinks.form, *found.second, "one", "two", "The security header has two SAML 2.0 tokens");
+  }
+}
+
+void VerifyToken(const TokenVerifier &tokens, const MessageRules &rules, CheckedMessage &message) {
+  try {
+    message.token = tokens.Verify(*message.assertion);
+  } catch (const Tarvel::Xml::Security::XmlSecurityException &error) {
+    Refuse(rules.sinks.form, *message.assertion, "an element with a canonical form", "",
+           "The token of the message is not accepted: %1", error.what());
   }
 }
 

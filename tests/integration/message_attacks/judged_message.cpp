@@ -95,7 +95,7 @@ Receiver MakeReceiver(const std::string &options) {
   return {MessageVerifier(TokenVerifier({CertificateOf("sts-rsa")}, tokenOptions), messageOptions), peer};
 }
 
-Decision Judge(const Receiver &receiver, const std::string &message) {
+Decision Verify(const Receiver &receiver, const std::string &message) {
   Decision decision;
   try {
     decision.message = receiver.verifier.Verify(message, receiver.peerCertificate.get());
@@ -103,6 +103,11 @@ Decision Judge(const Receiver &receiver, const std::string &message) {
     decision.exceptionClass = ClassOf(failure);
     decision.refusal = failure.what();
   }
+  return decision;
+}
+
+Decision Judge(const Receiver &receiver, const std::string &message) {
+  Decision decision = Verify(receiver, message);
   decision.report = receiver.verifier.Explain(message, receiver.peerCertificate.get());
   decision.contradictions = FindContradictions(decision);
   return decision;

@@ -1,10 +1,10 @@
 #!/usr/bin/env python3
 # SPDX-License-Identifier: Apache-2.0
-"""Makes the messages of this folder from the token fixtures: genuine messages, which xmlsec1 signs with the token's key,
-and what attackers and careless senders make of them.
+"""Makes the messages of this folder from the token fixtures: genuine messages, which xmlsec1 signs with the token's
+key, and what attackers and careless senders make of them.
 
-The outcome of each is in expected.tsv, with one line for each file: name, options of the verifier, class of the exception or
-"accepted", and its text or the proof. The clock of the tests is at 2026-01-02T03:04:05.006Z.
+The outcome of each is in expected.tsv, with one line for each file: name, options of the verifier, class of the
+exception or "accepted", and its text or the proof. The clock of the tests is at 2026-01-02T03:04:05.006Z.
 
 usage: make.py
 """
@@ -246,11 +246,12 @@ def envelopes():
            'XMLParseException')
     refuse('not-soap', HOLDER, 'The document is not a SOAP envelope')
     refuse('other-version', message().replace(S11, 'urn:soap'), 'The envelope is neither of SOAP 1.1 nor of SOAP 1.2')
+    neither = 'The envelope has content that is neither its header nor its body'
     refuse('mixed-versions-header', change(change(GENUINE, '<s:Header>', f'<t:Header xmlns:t="{S12}">'), '</s:Header>',
                                            '</t:Header>'),
-           'The envelope has content that is neither its header nor its body')
+           neither)
     refuse('mixed-versions-body', change(change(GENUINE, '<s:Body ', f'<t:Body xmlns:t="{S12}" '), '</s:Body>',
-                                         '</t:Body>'), 'The envelope has content that is neither its header nor its body')
+                                         '</t:Body>'), neither)
     refuse('no-header', f'<s:Envelope xmlns:s="{S11}"><s:Body/></s:Envelope>',
            'There is no security header for the last receiver')
     refuse('two-headers', change(GENUINE, '<s:Header>', '<s:Header/><s:Header>'), 'The envelope has a second header')
@@ -263,9 +264,9 @@ def envelopes():
     refuse('two-bodies-forged-first', change(GENUINE, '</s:Header>', f'</s:Header><s:Body>{FORGED}</s:Body>'),
            'The envelope has a second body')
     refuse('trailer', change(GENUINE, '</s:Envelope>', '<x/></s:Envelope>'),
-           'The envelope has content that is neither its header nor its body')
+           neither)
     refuse('text-in-envelope', change(GENUINE, '</s:Envelope>', 'text</s:Envelope>'),
-           'The envelope has content that is neither its header nor its body')
+           neither)
 
 
 def security_headers():
@@ -353,6 +354,9 @@ def tokens():
     refuse('token-expired', message(token=read('tokens/expired.xml')),
            'The token has expired at: ' + re.search(r'NotOnOrAfter="([^"]+)"', re.search(
                r'<saml:Conditions[^>]*>', read('tokens/expired.xml')).group(0)).group(1), 'ParseException')
+    unbound = change(GENUINE, '<saml:Issuer ', '<saml:Issuer unbound:a="" ')
+    refuse('token-without-canonical-form', unbound, 'The token of the message is not accepted: No canonical form: the '
+           'prefix "unbound" is not bound at ' + line_and_column(unbound, '<saml:Issuer '))
     refuse('token-identifier-twice', change(GENUINE, '<s:Header>', f'<s:Header><x ID="{ID}"/>'),
            f'Signature verification error. The reference URI "#{ID}" is not accepted: several elements have that '
            'identifier', 'InvalidSignatureException')
@@ -367,8 +371,8 @@ def proofs():
         'mallory@corp.example', 'alice@corp.example'), WRONG, proof, 'tls')
     refuse('bearer-not-accepted', envelope(timestamp() + BEARER),
            'The token is a bearer token, with which its sender proves nothing', proof)
-    refuse('bearer-signed', message(token=BEARER), 'A signature refers to the token, which is a bearer token and has no '
-           'key', proof, 'bearer')
+    refuse('bearer-signed', message(token=BEARER),
+           'A signature refers to the token, which is a bearer token and has no key', proof, 'bearer')
     refuse('another-key', message(key='tokens/other'), WRONG, proof)
     refuse('another-key-with-its-certificate', message(key='tokens/other', key_info=x509_data('tokens/other')),
            UNSIGNED, proof)
@@ -403,7 +407,8 @@ def proofs():
            'A signature refers to the token and to something else')
     refuse('key-info-names-token-and-name', message(key_info=token_reference(ID) + '<ds:KeyName>n</ds:KeyName>'),
            'A signature refers to the token and to something else')
-    refuse('key-info-with-external-uri', message(key_info=direct_reference('http://example.com/' + ID)), UNSIGNED, proof)
+    refuse('key-info-with-external-uri', message(key_info=direct_reference('http://example.com/' + ID)), UNSIGNED,
+           proof)
     refuse('two-proofs', change(GENUINE, PROOF, PROOF + PROOF.replace('Id="proof"', 'Id="again"')),
            'Two signatures refer to the token')
     refuse('foreign-proof-and-proof', change(GENUINE, PROOF, PROOF + message(key_info=token_reference('_second')).split(
@@ -412,8 +417,8 @@ def proofs():
            'The security header has more than 10 signatures')
     refuse('value-changed', change(GENUINE, PROOF, flip(PROOF)), WRONG, proof)
     missing = change(GENUINE, PROOF, change(PROOF, cut(PROOF, '<ds:SignatureValue>', '</ds:SignatureValue>'), ''))
-    refuse('value-missing', missing, SYNTAX + 'Expected ds:SignatureValue in "ds:Signature", but found "ds:KeyInfo" at ' +
-           line_and_column(missing, info + '</ds:Signature>'), proof)
+    refuse('value-missing', missing, SYNTAX + 'Expected ds:SignatureValue in "ds:Signature", but found ' +
+           '"ds:KeyInfo" at ' + line_and_column(missing, info + '</ds:Signature>'), proof)
 
 
 def flip(text):
