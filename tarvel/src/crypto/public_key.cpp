@@ -10,6 +10,7 @@
 #include "crypto/openssl_handles.h"
 #include "crypto/prepared_key.h"
 #include "crypto/private_key_impl.h"
+#include "crypto/provider_turn.h"
 #include "crypto/verifying_key_impl.h"
 
 #include <openssl/provider.h>
@@ -219,6 +220,7 @@ std::vector<std::uint8_t> SignDigest(const PrivateKey &key, SignatureScheme sche
     throw CryptoException("A key of algorithm " + key.GetAlgorithm() + " cannot make a signature of this scheme");
   }
   const PrivateKeyImpl &impl = AsImpl(key);
+  const ProviderTurn turn(impl.IsInAddedProvider());
   KeyContexts &contexts = impl.GetSignContexts();
   KeyContextHandle context = contexts.Acquire(scheme, algorithm);
   if (!context) {
