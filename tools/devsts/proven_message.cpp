@@ -156,7 +156,7 @@ void CheckToken(const SecurityHeader &security, const Identifiers &identifiers, 
     RefuseSecurity("the message has no token");
   }
   if (security.usernameToken || security.binaryToken) {
-    throw Refusal(Code::UNSUPPORTED_TOKEN, "the message has other credentials beyond its token");
+    throw Refusal(Code::UNSUPPORTED_TOKEN, "the message has credentials other than its token");
   }
   message.token = ReadIssuedToken(*security.assertion, identifiers, *policy.tokenSigner, Code::INVALID_TOKEN);
   message.tokenId = AttributeOf(*security.assertion, "ID").value_or("");
