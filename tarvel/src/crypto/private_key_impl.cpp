@@ -4,6 +4,7 @@
 
 #include "crypto/openssl_errors.h"
 #include "crypto/openssl_guard.h"
+#include "crypto/subject_public_key_der.h"
 
 #include <typeinfo>
 #include <utility>
@@ -28,6 +29,29 @@ PrivateKeyImpl::PrivateKeyImpl(KeyHandle native) : m_native(std::move(native)) {
   const char *const algorithm = EVP_PKEY_get0_type_name(m_native.get());
   throw CryptoException(std::string("Private key of algorithm ") + (algorithm ? algorithm : "unknown") +
                         ", which is neither RSA nor EC");
+}
+
+PrivateKeyImpl::~PrivateKeyImpl() {
+  if (const VerifyingKey *const publicKey = m_publicKey.load()) {
+    publicKey->Release();
+  }
+}
+
+// A key of a provider may have no readable private numbers. Its public numbers are encoded and decoded again, so that the
+// result is an ordinary key.
+Ref<const VerifyingKey> PrivateKeyImpl::GetPublicKey() const {
+  if (const VerifyingKey *const kept = m_publicKey.load(std::memory_order_acquire)) {
+    return Ref<const VerifyingKey>(kept);
+  }
+  const OpenSslGuard guard;
+  guard.Require();
+  const OpenSslErrorScope errors;
+  Ref<const VerifyingKey> made = CreateVerifyingKey(EncodeDer<const EVP_PKEY *>(i2d_PUBKEY, m_native.get(), errors));
+  const VerifyingKey *expected = nullptr;
+  if (m_publicKey.compare_exchange_strong(expected, made.get(), std::memory_order_acq_rel)) {
+    made->AddRef();
+  }
+  return made;
 }
 
 const PrivateKeyImpl &AsImpl(const PrivateKey &key) {

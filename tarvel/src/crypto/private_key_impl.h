@@ -8,6 +8,9 @@
 #include "crypto/openssl_handles.h"
 
 #include <tarvel/crypto/private_key.h>
+#include <tarvel/crypto/verifying_key.h>
+
+#include <atomic>
 
 namespace Tarvel::Crypto {
 
@@ -21,16 +24,21 @@ public:
   unsigned GetBits() const override { return m_bits; }
   KeyContexts &GetSignContexts() const noexcept { return m_signContexts; }
 
+  /// The public key that belongs to it. Encoding it costs nearly as much as a signature, so it is kept after the first call.
+  /// @throws CryptoException when the provider of the key fails; InvalidStateException; OutOfMemoryException.
+  Ref<const VerifyingKey> GetPublicKey() const;
+
   /// Owned by this object; OpenSSL counts its own references to it.
   EVP_PKEY *GetNative() const noexcept { return m_native.get(); }
 
 private:
-  ~PrivateKeyImpl() override = default;
+  ~PrivateKeyImpl() override;
 
   const char *m_algorithm = nullptr;
   unsigned m_bits = 0;
   KeyHandle m_native; // OpenSSL wipes the key's numbers when it frees them
   mutable KeyContexts m_signContexts;
+  mutable std::atomic<const VerifyingKey *> m_publicKey{nullptr}; // with one count of its references
 };
 
 /// Downcasts `key`.

@@ -4,6 +4,7 @@
 
 #include "support/data_file.h"
 #include "support/fixed_environment.h"
+#include "support/http_request_text.h"
 #include "support/throws_message.h"
 #include "support/token_stand_in.h"
 #include "support/work_folder.h"
