@@ -4,6 +4,7 @@
 
 #include "crypto/openssl_errors.h"
 #include "crypto/openssl_guard.h"
+#include "crypto/provider_turn.h"
 #include "crypto/subject_public_key_der.h"
 
 #include <typeinfo>
@@ -11,7 +12,8 @@
 
 namespace Tarvel::Crypto {
 
-PrivateKeyImpl::PrivateKeyImpl(KeyHandle native) : m_native(std::move(native)) {
+PrivateKeyImpl::PrivateKeyImpl(KeyHandle native)
+    : m_isInAddedProvider(Crypto::IsInAddedProvider(native.get())), m_native(std::move(native)) {
   const OpenSslGuard guard;
   guard.Require();
   const OpenSslErrorScope errors;
@@ -35,6 +37,9 @@ PrivateKeyImpl::~PrivateKeyImpl() {
   if (const VerifyingKey *const publicKey = m_publicKey.load()) {
     publicKey->Release();
   }
+  const ProviderTurn turn(m_isInAddedProvider); // a provider may have to remove the key from its hardware
+  m_signContexts.Clear();
+  m_native.reset();
 }
 
 // A key of a provider may have no readable private numbers. Its public numbers are encoded and decoded again, so that the
@@ -46,7 +51,11 @@ Ref<const VerifyingKey> PrivateKeyImpl::GetPublicKey() const {
   const OpenSslGuard guard;
   guard.Require();
   const OpenSslErrorScope errors;
-  Ref<const VerifyingKey> made = CreateVerifyingKey(EncodeDer<const EVP_PKEY *>(i2d_PUBKEY, m_native.get(), errors));
+  const auto der = [&] {
+    const ProviderTurn turn(m_isInAddedProvider);
+    return EncodeDer<const EVP_PKEY *>(i2d_PUBKEY, m_native.get(), errors);
+  }();
+  Ref<const VerifyingKey> made = CreateVerifyingKey(der);
   const VerifyingKey *expected = nullptr;
   if (m_publicKey.compare_exchange_strong(expected, made.get(), std::memory_order_acq_rel)) {
     made->AddRef();

@@ -22,6 +22,8 @@ public:
 
   std::string GetAlgorithm() const override { return m_algorithm; }
   unsigned GetBits() const override { return m_bits; }
+  /// Whether each use of the key needs a `ProviderTurn`.
+  bool IsInAddedProvider() const noexcept { return m_isInAddedProvider; }
   KeyContexts &GetSignContexts() const noexcept { return m_signContexts; }
 
   /// The public key that belongs to it. Encoding it costs nearly as much as a signature, so it is kept after the first call.
@@ -36,6 +38,7 @@ private:
 
   const char *m_algorithm = nullptr;
   unsigned m_bits = 0;
+  bool m_isInAddedProvider = false;
   KeyHandle m_native; // OpenSSL wipes the key's numbers when it frees them
   mutable KeyContexts m_signContexts;
   mutable std::atomic<const VerifyingKey *> m_publicKey{nullptr}; // with one count of its references
