@@ -48,6 +48,6 @@ final class MessageTokens {
     assertion.getSubject().getSubjectConfirmations().clear();
     assertion.getSubject().getSubjectConfirmations().add(confirmation);
     assertion.getAuthnStatements().add(SamlObjects.authentication());
-    return TokenMaker.signByOpenSaml(new TokenKinds.Kind("", assertion, treeChange, "", "", null), issuer);
+    return TokenMaker.signWithCertificate(new TokenKinds.Kind("", assertion, treeChange, "", "", null), issuer);
   }
 }
