@@ -27,7 +27,7 @@ final class MessageKinds {
     TOKEN_BY_ID,
     /** The token, by the transform that WS-Security defines for references to tokens. */
     TOKEN_BY_REFERENCE,
-    /** Another signature with another certificate, over the same parts. */
+    /** A signature with another certificate, over the same parts; in a message that the tool signs, over the timestamp. */
     OTHER_SIGNATURE,
     /** The header "urn:orders" Priority, which is in every message. */
     HEADER
@@ -81,13 +81,34 @@ final class MessageKinds {
 
   private final List<Kind> kinds = new ArrayList<>();
 
-  MessageKinds() {
-    addTokens();
-    addKeyForms();
-    addContents();
+  private MessageKinds() {
   }
 
-  List<Kind> all() {
+  /** The messages that WSS4J makes. */
+  static List<Kind> ofWss4j() {
+    MessageKinds made = new MessageKinds();
+    made.addTokens();
+    made.addKeyForms();
+    made.addContents();
+    return made.kinds;
+  }
+
+  /** The messages that the tool makes. It writes one form of KeyInfo, with the TokenType that the dialect chooses. */
+  static List<Kind> ofTool() {
+    MessageKinds made = new MessageKinds();
+    made.addTokens();
+    List<Kind> kinds = made.kinds;
+    kinds.add(kind("soap11-strict-default", Xml.SOAP, "strict", KeyForm.KEY_IDENTIFIER_OTHER_TYPE));
+    kinds.add(kind("soap12-ec256-default", Xml.SOAP12, "ec256-key-value", KeyForm.KEY_IDENTIFIER_OTHER_TYPE));
+    for (String soap : List.of(Xml.SOAP, Xml.SOAP12)) {
+      String prefix = soap.equals(Xml.SOAP) ? "soap11-" : "soap12-";
+      kinds.add(kind(prefix + "addressing", soap, "strict", KeyForm.KEY_IDENTIFIER).withAddressing());
+      kinds.add(kind(prefix + "header-part", soap, "ec256-certificate", KeyForm.KEY_IDENTIFIER)
+        .withExtra(Extra.HEADER));
+      kinds.add(kind(prefix + "role", soap, "strict", KeyForm.KEY_IDENTIFIER).withRole(ROLE));
+      kinds.add(kind(prefix + "other-signature", soap, "rsa-certificate", KeyForm.KEY_IDENTIFIER)
+        .withExtra(Extra.OTHER_SIGNATURE));
+    }
     return kinds;
   }
 

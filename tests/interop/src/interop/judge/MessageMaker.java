@@ -50,7 +50,11 @@ final class MessageMaker {
   }
 
   Token token(MessageKinds.Kind kind) {
-    return tokens.get(kind.token());
+    return token(kind.token());
+  }
+
+  Token token(String name) {
+    return tokens.get(name);
   }
 
   /** A message without security, with a body and a header that a service reads. */
@@ -94,6 +98,18 @@ final class MessageMaker {
     return names;
   }
 
+  /** The signed elements of the SOAP header that are not in the security header, as {namespace}name. */
+  static List<String> furtherParts(MessageKinds.Kind kind) {
+    List<String> parts = new ArrayList<>();
+    if (kind.extra() == MessageKinds.Extra.HEADER) {
+      parts.add("{" + ORDERS + "}Priority");
+    }
+    if (kind.hasAddressing()) {
+      ADDRESSING.forEach(name -> parts.add("{" + Xml.WSA + "}" + name));
+    }
+    return parts;
+  }
+
   String make(MessageKinds.Kind kind) throws Exception {
     Document document = Xml.parse(plain(kind.soap(), kind.hasAddressing()));
     WSSecHeader header = new WSSecHeader(kind.role().isEmpty() ? null : kind.role(), document);
@@ -110,7 +126,7 @@ final class MessageMaker {
     }
     if (kind.extra() == MessageKinds.Extra.OTHER_SIGNATURE) {
       WSSecSignature signature = new WSSecSignature(header);
-      configure(signature, kind, document);
+      configure(signature, kind);
       signature.setSignatureAlgorithm(MessageKinds.RSA_SHA256);
       signature.setKeyIdentifierType(WSConstants.BST_DIRECT_REFERENCE);
       signature.build(crypto(other));
@@ -123,11 +139,28 @@ final class MessageMaker {
     return Xml.write(document);
   }
 
+  /** A message without a token, in which another party has signed a timestamp, as an input of the tool. */
+  String withOtherSignature(MessageKinds.Kind kind) throws Exception {
+    Document document = Xml.parse(plain(kind.soap(), kind.hasAddressing()));
+    WSSecHeader header = new WSSecHeader(document);
+    header.insertSecurityHeader();
+    WSSecTimestamp timestamp = new WSSecTimestamp(header);
+    timestamp.setTimeToLive(LIFETIME_SECONDS);
+    timestamp.build();
+    WSSecSignature signature = new WSSecSignature(header);
+    configure(signature, kind);
+    signature.getParts().removeIf(part -> !part.getName().equals("Timestamp"));
+    signature.setSignatureAlgorithm(MessageKinds.RSA_SHA256);
+    signature.setKeyIdentifierType(WSConstants.BST_DIRECT_REFERENCE);
+    signature.build(crypto(other));
+    return Xml.write(document);
+  }
+
   /** Signs with a reference to the token, which WSS4J then also puts into the header. */
   private void signByReference(MessageKinds.Kind kind, WSSecHeader header, Element assertion) throws Exception {
     Document document = header.getSecurityHeaderDoc();
     WSSecSignatureSAML signature = new WSSecSignatureSAML(header);
-    configure(signature, kind, document);
+    configure(signature, kind);
     signature.setUseDirectReferenceToAssertion(kind.form() == MessageKinds.KeyForm.DIRECT_REFERENCE);
     String identifier = assertion.getAttribute("ID");
     switch (kind.form()) {
@@ -150,7 +183,7 @@ final class MessageMaker {
     Document document = header.getSecurityHeaderDoc();
     X509Certificate certificate = token(kind).holder().certificate();
     WSSecSignature signature = new WSSecSignature(header);
-    configure(signature, kind, document);
+    configure(signature, kind);
     switch (kind.form()) {
       case KEY_VALUE -> signature.setKeyIdentifierType(WSConstants.KEY_VALUE);
       case X509_DATA -> signature.setCustomKeyInfoElement(x509Data(document, certificate));
@@ -164,15 +197,15 @@ final class MessageMaker {
     new WSSecSAMLToken(header).build(new SamlAssertionWrapper(assertion));
   }
 
-  private static void configure(WSSecSignature signature, MessageKinds.Kind kind, Document document) {
+  private static void configure(WSSecSignature signature, MessageKinds.Kind kind) {
     signature.setUserInfo("key", PASSWORD);
     signature.setSignatureAlgorithm(kind.algorithm());
     signature.setDigestAlgo(SHA256);
     signature.setAddInclusivePrefixes(kind.hasPrefixLists());
-    signature.getParts().addAll(parts(kind, document));
+    signature.getParts().addAll(parts(kind));
   }
 
-  private static List<WSEncryptionPart> parts(MessageKinds.Kind kind, Document document) {
+  private static List<WSEncryptionPart> parts(MessageKinds.Kind kind) {
     List<WSEncryptionPart> parts = new ArrayList<>();
     parts.add(new WSEncryptionPart("Body", kind.soap(), "Element"));
     parts.add(new WSEncryptionPart("Timestamp", Xml.WSU, "Element"));
