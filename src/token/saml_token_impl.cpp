@@ -76,6 +76,9 @@ void SamlTokenImpl::InitializeSaml2(NodeFilterIterator &iterator, const KeyInfoR
   m_facts.audience = TakeCommonAudiences(std::move(assertion.details.audienceRestrictions));
   m_nameId = std::move(assertion.details.subject);
   m_usedConfirmation = assertion.details.usedConfirmation;
+  if (m_facts.confirmationMethod == HOLDER_OF_KEY && !m_facts.confirmationCertificate) {
+    m_confirmationKeyValue = std::move(assertion.details.confirmations[m_usedConfirmation].publicKey);
+  }
 }
 
 NameId SamlTokenImpl::GetNameId() const {

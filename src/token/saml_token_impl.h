@@ -16,7 +16,9 @@
 #include <boost/optional.hpp>
 
 #include <cstddef>
+#include <cstdint>
 #include <string>
+#include <vector>
 
 namespace SsoClient {
 
@@ -65,6 +67,9 @@ public:
   /// The index, in document order, of the confirmation that the verification chose.
   std::size_t GetUsedConfirmation() const noexcept { return m_usedConfirmation; }
 
+  /// The key value of the used confirmation, if it has no certificate: SubjectPublicKeyInfo in DER. Otherwise empty.
+  const std::vector<std::uint8_t> &GetConfirmationKeyValue() const noexcept { return m_confirmationKeyValue; }
+
   /// @throws InvalidSignatureException unless `signature` verifies with one of the keys of `resolver`.
   static void ValidateSignature(const Tarvel::Xml::Security::Signature &signature,
                                 const Tarvel::Xml::Security::KeyInfoResolver &resolver);
@@ -81,6 +86,7 @@ private:
   TokenFacts m_facts;
   boost::optional<NameId> m_nameId; // empty in the profile STRICT: `m_facts.subject` has it
   std::size_t m_usedConfirmation = 0;
+  std::vector<std::uint8_t> m_confirmationKeyValue;
 };
 
 } // namespace SsoClient

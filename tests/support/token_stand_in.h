@@ -1,10 +1,12 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// `TokenStandIn`, a token whose text, identifier and confirmation a test chooses.
+/// `TokenStandIn`, a token whose text, identifier, confirmation and certificate a test chooses.
 
 #pragma once
 
 #include <ssoclient/saml_token.h>
+#include <tarvel/core/ref.h>
+#include <tarvel/crypto/certificate.h>
 
 #include <string>
 #include <utility>
@@ -13,8 +15,10 @@ namespace Testing {
 
 class TokenStandIn final : public SsoClient::SamlToken {
 public:
-  TokenStandIn(std::string id, std::string xml, ConfirmationType confirmation)
-      : m_id(std::move(id)), m_xml(std::move(xml)), m_confirmation(confirmation) {}
+  TokenStandIn(std::string id, std::string xml, ConfirmationType confirmation,
+               Tarvel::Ref<const Tarvel::Crypto::Certificate> certificate = {})
+      : m_id(std::move(id)), m_xml(std::move(xml)), m_confirmation(confirmation),
+        m_certificate(std::move(certificate)) {}
 
   const std::string &GetId() const override { return m_id; }
   const Tarvel::System::DateTime &GetStartDate() const override { return m_date; }
@@ -29,13 +33,14 @@ public:
   void GetDelegationChain(std::vector<SsoClient::Delegate> &chain) const override { chain.clear(); }
   void GetAudience(std::set<std::string> &audience) const override { audience.clear(); }
   void GetAdvice(std::vector<SsoClient::Advice> &advice) const override { advice.clear(); }
-  const Tarvel::Crypto::Certificate *GetConfirmationCertificate() const override { return nullptr; }
+  const Tarvel::Crypto::Certificate *GetConfirmationCertificate() const override { return m_certificate.get(); }
   const std::string &ToXml() const override { return m_xml; }
 
 private:
   std::string m_id;
   std::string m_xml;
   ConfirmationType m_confirmation;
+  Tarvel::Ref<const Tarvel::Crypto::Certificate> m_certificate;
   Tarvel::System::DateTime m_date;
   SsoClient::PrincipalId m_subject;
 };

@@ -81,9 +81,9 @@ void AddCommonNames(const X509 *certificate, CertificateFacts &facts) {
 }
 
 std::string DescribeKey(const CertificateImpl &certificate) {
-  switch (certificate.GetKeyKind()) {
+  switch (certificate.GetKey().GetKind()) {
   case KeyKind::RSA:
-    return "RSA, " + std::to_string(certificate.GetKeyBits()) + " bits";
+    return "RSA, " + std::to_string(certificate.GetKey().GetBits()) + " bits";
   case KeyKind::EC_P256:
     return "EC, P-256";
   case KeyKind::EC_P384:
@@ -95,7 +95,7 @@ std::string DescribeKey(const CertificateImpl &certificate) {
   }
   EVP_PKEY *const key = certificate.GetNativeKey();
   const char *const name = key ? EVP_PKEY_get0_type_name(key) : nullptr;
-  return name ? name + (", " + std::to_string(certificate.GetKeyBits())) + " bits" : "unknown";
+  return name ? name + (", " + std::to_string(certificate.GetKey().GetBits())) + " bits" : "unknown";
 }
 
 } // namespace

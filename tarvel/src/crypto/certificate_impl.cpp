@@ -5,25 +5,23 @@
 #include "crypto/library_context.h"
 #include "crypto/openssl_errors.h"
 #include "crypto/openssl_guard.h"
+#include "crypto/thumbprint.h"
 
 #include <tarvel/core/ref.h>
 
-#include <openssl/bn.h>
-#include <openssl/core_names.h>
 #include <openssl/pem.h>
 
-#include <array>
+#include <algorithm>
 #include <chrono>
 #include <ctime>
 #include <limits>
 #include <string>
 #include <typeinfo>
+#include <utility>
 
 namespace Tarvel::Crypto {
 
 namespace {
-
-constexpr std::size_t MAX_CURVE_NAME_BYTES = 80;
 
 CertificateHandle Decode(const std::vector<std::uint8_t> &der) {
   OpenSslGuard::Prepare();
@@ -82,44 +80,6 @@ std::int64_t ToUtcMicroseconds(const ASN1_TIME *time) {
   return duration_cast<microseconds>(instant.time_since_epoch()).count();
 }
 
-KeyKind FindCurve(EVP_PKEY *key) {
-  std::array<char, MAX_CURVE_NAME_BYTES> name{};
-  const OpenSslErrorScope errors;
-  if (EVP_PKEY_get_group_name(key, name.data(), name.size(), nullptr) != 1) {
-    errors.RequireMemory();
-    return KeyKind::OTHER;
-  }
-  const std::string_view curve = name.data();
-  if (curve == "prime256v1") {
-    return KeyKind::EC_P256;
-  }
-  if (curve == "secp384r1") {
-    return KeyKind::EC_P384;
-  }
-  return curve == "secp521r1" ? KeyKind::EC_P521 : KeyKind::OTHER;
-}
-
-KeyKind FindKeyKind(EVP_PKEY *key) {
-  if (!key) {
-    return KeyKind::OTHER;
-  }
-  if (EVP_PKEY_is_a(key, "RSA")) {
-    return KeyKind::RSA;
-  }
-  return EVP_PKEY_is_a(key, "EC") ? FindCurve(key) : KeyKind::OTHER;
-}
-
-bool HasSoundExponent(EVP_PKEY *key) {
-  const OpenSslErrorScope errors;
-  BIGNUM *read = nullptr;
-  const int isRead = EVP_PKEY_get_bn_param(key, OSSL_PKEY_PARAM_RSA_E, &read);
-  const BignumHandle exponent(read);
-  if (isRead != 1) {
-    errors.Throw("The RSA key's exponent cannot be read");
-  }
-  return IsExponentSound(exponent.get());
-}
-
 std::string CopyBioText(BIO *bio) {
   char *text = nullptr;
   const long length = BIO_get_mem_data(bio, &text);
@@ -157,13 +117,11 @@ CertificateImpl::CertificateImpl(const std::uint8_t *data, std::size_t length)
   m_notBefore = ToUtcMicroseconds(X509_get0_notBefore(m_native.get()));
   m_notAfter = ToUtcMicroseconds(X509_get0_notAfter(m_native.get()));
   const OpenSslErrorScope errors;
-  m_nativeKey = X509_get0_pubkey(m_native.get());
-  m_keyKind = FindKeyKind(m_nativeKey);
-  if (m_keyKind == KeyKind::OTHER) {
+  KeyHandle key(X509_get_pubkey(m_native.get()));
+  if (!key) {
     errors.RequireMemory();
   }
-  m_keyBits = m_nativeKey ? static_cast<unsigned>(EVP_PKEY_get_bits(m_nativeKey)) : 0;
-  m_hasAcceptableExponent = m_keyKind != KeyKind::RSA || HasSoundExponent(m_nativeKey);
+  m_key = MakeRef<PreparedKey>(std::move(key));
 }
 
 std::string CertificateImpl::GetSubject() const {
@@ -175,18 +133,7 @@ std::string CertificateImpl::GetIssuer() const {
 }
 
 std::string CertificateImpl::GetSha256Thumbprint() const {
-  constexpr std::string_view HEX_DIGITS = "0123456789abcdef";
-  std::array<std::uint8_t, DigestBytes(DigestAlgorithm::SHA256)> digest{};
-  Digest sha256(DigestAlgorithm::SHA256);
-  sha256.Update(std::string_view(reinterpret_cast<const char *>(m_der.data()), m_der.size()));
-  sha256.Finish(digest.data());
-  std::string text;
-  text.reserve(digest.size() * 2);
-  for (const std::uint8_t byte : digest) {
-    text.push_back(HEX_DIGITS[byte >> 4]);
-    text.push_back(HEX_DIGITS[byte & 0x0f]);
-  }
-  return text;
+  return MakeSha256Thumbprint(m_der);
 }
 
 std::string CertificateImpl::ToPem() const {
@@ -198,10 +145,6 @@ std::string CertificateImpl::ToPem() const {
     errors.Throw("Certificate cannot be written as PEM");
   }
   return CopyBioText(bio.get());
-}
-
-bool IsExponentSound(const BIGNUM *exponent) noexcept {
-  return BN_is_odd(exponent) && !BN_is_one(exponent) && !BN_is_negative(exponent);
 }
 
 const CertificateImpl &AsImpl(const Certificate &certificate) {

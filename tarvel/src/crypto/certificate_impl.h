@@ -4,9 +4,8 @@
 
 #pragma once
 
-#include "crypto/key_contexts.h"
 #include "crypto/openssl_handles.h"
-#include "crypto/public_key.h"
+#include "crypto/prepared_key.h"
 
 #include <tarvel/crypto/certificate.h>
 
@@ -26,32 +25,22 @@ public:
   System::DateTime GetNotAfter() const override { return System::DateTimeFromUtc(m_notAfter, false); }
   std::string ToPem() const override;
 
-  KeyKind GetKeyKind() const noexcept { return m_keyKind; }
-  unsigned GetKeyBits() const noexcept { return m_keyBits; }
-  bool HasAcceptableExponent() const noexcept { return m_hasAcceptableExponent; }
-  KeyContexts &GetVerifyContexts() const noexcept { return m_verifyContexts; }
+  const PreparedKey &GetKey() const noexcept { return *m_key; }
+  Ref<const PreparedKey> ShareKey() const noexcept { return m_key; }
 
   /// Owned by the certificate. The key is null when OpenSSL does not know its algorithm.
   X509 *GetNative() const noexcept { return m_native.get(); }
-  EVP_PKEY *GetNativeKey() const noexcept { return m_nativeKey; }
+  EVP_PKEY *GetNativeKey() const noexcept { return m_key->GetNative(); }
 
 private:
   ~CertificateImpl() override = default;
 
   std::vector<std::uint8_t> m_der;
   CertificateHandle m_native;
-  EVP_PKEY *m_nativeKey = nullptr; // owned by m_native
-  KeyKind m_keyKind = KeyKind::OTHER;
-  unsigned m_keyBits = 0;
-  bool m_hasAcceptableExponent = false;
+  Ref<const PreparedKey> m_key; // never null after construction
   std::int64_t m_notBefore = 0; // microseconds since the epoch
   std::int64_t m_notAfter = 0;
-  mutable KeyContexts m_verifyContexts;
 };
-
-/// Whether an RSA key with this public exponent can be used: with the exponent 1, anyone can sign; for an even exponent,
-/// there is no private key (RFC 8017, section 3.1).
-bool IsExponentSound(const BIGNUM *exponent) noexcept;
 
 /// Downcasts `certificate`.
 /// @throws TypeMismatchException when it is an instance of another class.

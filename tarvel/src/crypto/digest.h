@@ -7,6 +7,8 @@
 #include "crypto/openssl_errors.h"
 #include "crypto/openssl_guard.h"
 
+#include <tarvel/crypto/message_digest.h>
+
 #include <cstddef>
 #include <cstdint>
 #include <optional>
@@ -14,7 +16,7 @@
 
 namespace Tarvel::Crypto {
 
-enum class DigestAlgorithm { SHA256, SHA384, SHA512 };
+using DigestAlgorithm = HashAlgorithm;
 
 constexpr std::size_t MAX_DIGEST_BYTES = 64;
 

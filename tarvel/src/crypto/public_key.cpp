@@ -8,7 +8,9 @@
 #include "crypto/openssl_errors.h"
 #include "crypto/openssl_guard.h"
 #include "crypto/openssl_handles.h"
+#include "crypto/prepared_key.h"
 #include "crypto/private_key_impl.h"
+#include "crypto/verifying_key_impl.h"
 
 #include <openssl/rsa.h>
 
@@ -133,20 +135,30 @@ bool Verify(EVP_PKEY_CTX *context, DigestAlgorithm algorithm, const std::uint8_t
 
 } // namespace
 
+const PreparedKey &GetPreparedKey(const Certificate &certificate) {
+  return AsImpl(certificate).GetKey();
+}
+
+const PreparedKey &GetPreparedKey(const VerifyingKey &key) {
+  return AsImpl(key).GetKey();
+}
+
 KeyKind GetKeyKind(const Certificate &certificate, unsigned &bits) {
-  const CertificateImpl &impl = AsImpl(certificate);
-  bits = impl.GetKeyBits();
-  return impl.GetKeyKind();
+  const PreparedKey &key = GetPreparedKey(certificate);
+  bits = key.GetBits();
+  return key.GetKind();
 }
 
 bool HasAcceptableExponent(const Certificate &certificate) {
-  return AsImpl(certificate).HasAcceptableExponent();
+  return GetPreparedKey(certificate).HasAcceptableExponent();
 }
 
 std::string RefuseKey(const Certificate &certificate) {
-  unsigned bits = 0;
-  const KeyKind kind = GetKeyKind(certificate, bits);
-  return RefuseKey(kind, bits, HasAcceptableExponent(certificate));
+  return RefuseKey(GetPreparedKey(certificate));
+}
+
+std::string RefuseKey(const PreparedKey &key) {
+  return RefuseKey(key.GetKind(), key.GetBits(), key.HasAcceptableExponent());
 }
 
 std::string RefuseKey(KeyKind kind, unsigned bits, bool hasAcceptableExponent) {
@@ -162,18 +174,22 @@ std::string RefuseKey(KeyKind kind, unsigned bits, bool hasAcceptableExponent) {
 
 bool VerifyDigest(const Certificate &certificate, SignatureScheme scheme, DigestAlgorithm algorithm,
                   const std::uint8_t *digest, const std::uint8_t *signature, std::size_t signatureLength) {
-  const CertificateImpl &impl = AsImpl(certificate);
-  const std::size_t numberBytes = BytesOf(impl.GetKeyBits());
+  return VerifyDigest(GetPreparedKey(certificate), scheme, algorithm, digest, signature, signatureLength);
+}
+
+bool VerifyDigest(const PreparedKey &key, SignatureScheme scheme, DigestAlgorithm algorithm, const std::uint8_t *digest,
+                  const std::uint8_t *signature, std::size_t signatureLength) {
+  const std::size_t numberBytes = BytesOf(key.GetBits());
   const std::size_t expectedLength = IsRsaScheme(scheme) ? numberBytes : 2 * numberBytes;
-  if (!MatchesScheme(impl.GetKeyKind(), scheme) || signatureLength != expectedLength) {
+  if (!MatchesScheme(key.GetKind(), scheme) || signatureLength != expectedLength) {
     return false;
   }
   const OpenSslGuard guard;
   guard.Require();
-  KeyContexts &contexts = impl.GetVerifyContexts();
+  KeyContexts &contexts = key.GetVerifyContexts();
   KeyContextHandle context = contexts.Acquire(scheme, algorithm);
   if (!context) {
-    context = NewVerifyContext(impl.GetNativeKey(), scheme, algorithm);
+    context = NewVerifyContext(key.GetNative(), scheme, algorithm);
   }
   bool genuine = false;
   if (IsRsaScheme(scheme)) {

@@ -8,6 +8,7 @@
 #include "crypto/openssl_guard.h"
 #include "crypto/openssl_handles.h"
 #include "crypto/public_key.h"
+#include "crypto/subject_public_key_der.h"
 
 #include <openssl/bn.h>
 #include <openssl/core_names.h>
@@ -80,18 +81,6 @@ KeyHandle MakeRsaKey(const BIGNUM *modulus, const BIGNUM *exponent, const OpenSs
   return MakeKey("RSA", parameters.get(), errors);
 }
 
-template <typename Object>
-std::vector<std::uint8_t> Encode(int (*encode)(Object, unsigned char **), Object object,
-                                 const OpenSslErrorScope &errors) {
-  unsigned char *der = nullptr;
-  const int length = encode(object, &der);
-  const MemoryHandle owner(der);
-  if (length <= 0) {
-    errors.Throw("Public key does not encode");
-  }
-  return {der, der + length};
-}
-
 } // namespace
 
 SubjectPublicKey MakeRsaPublicKey(const std::vector<std::uint8_t> &modulus, const std::vector<std::uint8_t> &exponent) {
@@ -111,7 +100,7 @@ SubjectPublicKey MakeRsaPublicKey(const std::vector<std::uint8_t> &modulus, cons
   SubjectPublicKey key;
   key.refusal = RefuseKey(KeyKind::RSA, bits, IsExponentSound(e.get()));
   const KeyHandle native = MakeRsaKey(n.get(), e.get(), errors);
-  key.der = Encode<const EVP_PKEY *>(i2d_PUBKEY, native.get(), errors);
+  key.der = EncodeDer<const EVP_PKEY *>(i2d_PUBKEY, native.get(), errors);
   return key;
 }
 
@@ -135,7 +124,7 @@ SubjectPublicKey MakeEcPublicKey(NamedCurve curve, const std::vector<std::uint8_
     errors.Throw("The point is not a public key");
   }
   const KeyHandle native = MakeKey("EC", parameters.get(), errors);
-  return {Encode<const EVP_PKEY *>(i2d_PUBKEY, native.get(), errors), RefuseKey(described.kind, 0, true)};
+  return {EncodeDer<const EVP_PKEY *>(i2d_PUBKEY, native.get(), errors), RefuseKey(described.kind, 0, true)};
 }
 
 std::vector<std::uint8_t> GetSubjectPublicKey(const Certificate &certificate) {
@@ -143,7 +132,7 @@ std::vector<std::uint8_t> GetSubjectPublicKey(const Certificate &certificate) {
   const OpenSslGuard guard;
   guard.Require();
   const OpenSslErrorScope errors;
-  return Encode<const X509_PUBKEY *>(i2d_X509_PUBKEY, X509_get_X509_PUBKEY(impl.GetNative()), errors);
+  return EncodeDer<const X509_PUBKEY *>(i2d_X509_PUBKEY, X509_get_X509_PUBKEY(impl.GetNative()), errors);
 }
 
 bool HasPublicKey(const Certificate &certificate, const std::vector<std::uint8_t> &subjectPublicKeyInfo) {

@@ -98,6 +98,13 @@ done
   -out certificate-only.p12
 ! missing key-only.p12 || openssl pkcs12 -export -nocerts -inkey rsa2048.key -passout "$PASSPHRASE" -out key-only.p12
 
+# Public keys (SubjectPublicKeyInfo).
+for name in rsa1024 rsa2048 p224 p256 p384 p521 ed25519; do
+  ! missing "$name.spki.der" || openssl pkey -in "$name.key" -pubout -outform DER -out "$name.spki.der"
+done
+! missing p256-compressed.spki.der ||
+  openssl ec -in p256.key -pubout -conv_form compressed -outform DER -out p256-compressed.spki.der
+
 # Signatures over message.txt: NAME-SCHEME-DIGEST.sig. ECDSA values also as r followed by s, NAME-ecdsa-DIGEST.raw.
 ! missing message.txt || printf 'What is signed is what was meant.\n' >message.txt
 

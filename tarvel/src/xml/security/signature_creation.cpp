@@ -44,6 +44,7 @@ public:
 
   const std::vector<Reference> &GetReferences() const noexcept override { return m_references; }
   bool Verify(const KeyInfoResolver &resolver, std::set<std::string> &signedUris) const override;
+  bool Verify(const Crypto::VerifyingKey &key, Coverage &coverage) const override;
   void AddReference(std::string_view uri, std::string_view digestUri, std::string_view transformUri) override;
   void SetKeyInfo(const Ref<ElementNode> &content) override;
   void Sign(const Crypto::PrivateKey &key) override;
@@ -58,6 +59,7 @@ private:
 
   void RequireUnsigned() const;
   void RequireSigned() const;
+  Ref<Signature> Parsed() const;
   std::vector<std::uint8_t> SignatureValue(const ElementNode &signedInfo, const Crypto::PrivateKey &key) const;
   void AppendMethod(ElementNode &parent, std::string_view localName, std::string_view uri) const;
   void AppendText(ElementNode &parent, std::string_view localName, const std::string &text) const;
@@ -75,17 +77,23 @@ private:
 };
 
 bool BlankSignature::Verify(const KeyInfoResolver &resolver, std::set<std::string> &signedUris) const {
-  RequireSigned();
-  Ref<Signature> parsed;
-  CreateSignatureFromDom(*m_root, *m_element, parsed);
-  return parsed->Verify(resolver, signedUris);
+  return Parsed()->Verify(resolver, signedUris);
+}
+
+bool BlankSignature::Verify(const Crypto::VerifyingKey &key, Coverage &coverage) const {
+  return Parsed()->Verify(key, coverage);
 }
 
 SignatureReport BlankSignature::Explain(const KeyInfoResolver &resolver) const {
+  return Parsed()->Explain(resolver);
+}
+
+/// The signature that was made, read from its element.
+Ref<Signature> BlankSignature::Parsed() const {
   RequireSigned();
   Ref<Signature> parsed;
   CreateSignatureFromDom(*m_root, *m_element, parsed);
-  return parsed->Explain(resolver);
+  return parsed;
 }
 
 void BlankSignature::AddReference(std::string_view uri, std::string_view digestUri, std::string_view transformUri) {

@@ -221,7 +221,7 @@ void Explanation::TryKeys(const DigestValue &signedInfo) {
 }
 
 void Explanation::TryKey(Key &key, const DigestValue &signedInfo) {
-  key.madeSignature = IsMadeBy(*key.certificate, m_syntax, *m_plan.algorithm, signedInfo);
+  key.madeSignature = IsMadeBy(Crypto::GetPreparedKey(*key.certificate), m_syntax, *m_plan.algorithm, signedInfo);
   m_report.isValueChecked = true;
 }
 

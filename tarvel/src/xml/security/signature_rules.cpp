@@ -19,28 +19,39 @@ namespace {
 
 constexpr std::size_t MAX_DESCRIBED_KEYS = 10; // in one text
 
-std::string DescribeKey(const Crypto::Certificate &certificate) {
-  unsigned bits = 0;
-  const Crypto::KeyKind kind = Crypto::GetKeyKind(certificate, bits);
-  if (kind == Crypto::KeyKind::OTHER) {
+std::string DescribeKey(const Crypto::PreparedKey &key) {
+  if (key.GetKind() == Crypto::KeyKind::OTHER) {
     return "a key that is neither RSA nor on an accepted curve";
   }
-  if (kind != Crypto::KeyKind::RSA) {
-    return "an EC key of " + std::to_string(bits) + " bits";
+  const std::string bits = std::to_string(key.GetBits()) + " bits";
+  if (key.GetKind() != Crypto::KeyKind::RSA) {
+    return "an EC key of " + bits;
   }
-  return "an RSA key of " + std::to_string(bits) + " bits" +
-         (Crypto::HasAcceptableExponent(certificate) ? "" : " with an unsafe public exponent");
+  return "an RSA key of " + bits + (key.HasAcceptableExponent() ? "" : " with an unsafe public exponent");
 }
 
 std::string DescribeKeys(const Crypto::CertificateList &keys) {
   std::string text;
   for (std::size_t index = 0; index < std::min(keys.size(), MAX_DESCRIBED_KEYS); ++index) {
-    text.append(text.empty() ? "" : ", ").append(keys[index] ? DescribeKey(*keys[index]) : "no key");
+    text.append(text.empty() ? "" : ", ")
+        .append(keys[index] ? DescribeKey(Crypto::GetPreparedKey(*keys[index])) : "no key");
   }
   if (keys.size() > MAX_DESCRIBED_KEYS) {
     text += ", and " + std::to_string(keys.size() - MAX_DESCRIBED_KEYS) + " more";
   }
   return text.empty() ? "no trusted key" : text;
+}
+
+/// Refuses the keys for the signature's algorithm. The caller adds what was found.
+SignatureReport::Refusal &RefuseKeys(const std::string &message, const SignatureSyntax &syntax,
+                                     Crypto::SignatureScheme scheme, RefusalSink &sink) {
+  SignatureReport::Refusal &refusal =
+      sink.Add(SignatureRule::KEYS, message + " \"" + StringUtil::Shorten(syntax.signatureMethod.uri) + "\"",
+               syntax.signatureMethod.element);
+  refusal.wanted = scheme == Crypto::SignatureScheme::ECDSA
+                       ? "an EC key on the curve P-256, P-384 or P-521"
+                       : "an RSA key of at least 2048 bits with an odd public exponent of at least 3";
+  return refusal;
 }
 
 bool IsWithin(const Node *node, const Node &apex) {
@@ -60,10 +71,20 @@ void RefuseTarget(const ReferenceSyntax &reference, const char *why, RefusalSink
 
 } // namespace
 
+bool IsUsable(const Crypto::PreparedKey &key, Crypto::SignatureScheme scheme) {
+  const bool isRsa = key.GetKind() == Crypto::KeyKind::RSA;
+  return isRsa == (scheme != Crypto::SignatureScheme::ECDSA) && Crypto::RefuseKey(key).empty();
+}
+
 bool IsUsable(const Crypto::Certificate &certificate, Crypto::SignatureScheme scheme) {
-  unsigned bits = 0;
-  const bool isRsa = Crypto::GetKeyKind(certificate, bits) == Crypto::KeyKind::RSA;
-  return isRsa == (scheme != Crypto::SignatureScheme::ECDSA) && Crypto::RefuseKey(certificate).empty();
+  return IsUsable(Crypto::GetPreparedKey(certificate), scheme);
+}
+
+void RequireUsableKey(const SignatureSyntax &syntax, Crypto::SignatureScheme scheme, const Crypto::PreparedKey &key,
+                      RefusalSink &sink) {
+  if (!IsUsable(key, scheme)) {
+    RefuseKeys("The key cannot be used with the signature algorithm", syntax, scheme, sink).found = DescribeKey(key);
+  }
 }
 
 Crypto::CertificateList RequireUsableKeys(const SignatureSyntax &syntax, Crypto::SignatureScheme scheme,
@@ -72,14 +93,8 @@ Crypto::CertificateList RequireUsableKeys(const SignatureSyntax &syntax, Crypto:
     return candidate && IsUsable(*candidate, scheme);
   };
   if (std::none_of(candidates.begin(), candidates.end(), isUsable)) {
-    SignatureReport::Refusal &refusal = sink.Add(SignatureRule::KEYS,
-                                                 "No trusted key can be used with the signature algorithm \"" +
-                                                     StringUtil::Shorten(syntax.signatureMethod.uri) + "\"",
-                                                 syntax.signatureMethod.element);
-    refusal.found = DescribeKeys(candidates);
-    refusal.wanted = scheme == Crypto::SignatureScheme::ECDSA
-                         ? "an EC key on the curve P-256, P-384 or P-521"
-                         : "an RSA key of at least 2048 bits with an odd public exponent of at least 3";
+    RefuseKeys("No trusted key can be used with the signature algorithm", syntax, scheme, sink).found =
+        DescribeKeys(candidates);
   }
   std::erase_if(candidates, std::not_fn(isUsable));
   return candidates;
@@ -117,7 +132,7 @@ DigestValue DigestSignedInfo(const SignatureInTree &signature, const Canonicaliz
   return DigestCanonicalForm(*signature.syntax.signedInfo, method, nullptr, algorithm.digest);
 }
 
-bool IsMadeBy(const Crypto::Certificate &key, const SignatureSyntax &syntax, SignatureAlgorithm algorithm,
+bool IsMadeBy(const Crypto::PreparedKey &key, const SignatureSyntax &syntax, SignatureAlgorithm algorithm,
               const DigestValue &signedInfo) {
   return Crypto::VerifyDigest(key, algorithm.scheme, algorithm.digest, signedInfo.data(), syntax.signatureValue.data(),
                               syntax.signatureValue.size());

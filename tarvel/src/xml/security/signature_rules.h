@@ -4,6 +4,7 @@
 
 #pragma once
 
+#include "crypto/prepared_key.h"
 #include "xml/security/canonical_digest.h"
 #include "xml/security/refusal_sink.h"
 #include "xml/security/signature_profile.h"
@@ -24,8 +25,13 @@ struct SignatureInTree {
   SignatureSyntax syntax;
 };
 
-/// Whether the certificate's key can be used with a scheme.
+/// Whether the key, or the certificate's key, can be used with a scheme.
+bool IsUsable(const Crypto::PreparedKey &key, Crypto::SignatureScheme scheme);
 bool IsUsable(const Crypto::Certificate &certificate, Crypto::SignatureScheme scheme);
+
+/// If the key cannot be used with the scheme, `sink` receives a refusal.
+void RequireUsableKey(const SignatureSyntax &syntax, Crypto::SignatureScheme scheme, const Crypto::PreparedKey &key,
+                      RefusalSink &sink);
 
 /// The usable keys of `candidates`, which may contain nulls. If no key is usable, `sink` receives a refusal.
 Crypto::CertificateList RequireUsableKeys(const SignatureSyntax &syntax, Crypto::SignatureScheme scheme,
@@ -48,7 +54,7 @@ DigestValue DigestSignedInfo(const SignatureInTree &signature, const Canonicaliz
 
 /// Whether a key made the signature's value over the digest `signedInfo`.
 /// @throws what `Crypto::VerifyDigest` throws.
-bool IsMadeBy(const Crypto::Certificate &key, const SignatureSyntax &syntax, SignatureAlgorithm algorithm,
+bool IsMadeBy(const Crypto::PreparedKey &key, const SignatureSyntax &syntax, SignatureAlgorithm algorithm,
               const DigestValue &signedInfo);
 
 /// The digest of `target`, for which `RequireTargetContainsSignature` must be true.

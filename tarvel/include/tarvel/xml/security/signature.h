@@ -7,11 +7,13 @@
 #include <tarvel/core/export.h>
 #include <tarvel/core/ref.h>
 #include <tarvel/crypto/private_key.h>
+#include <tarvel/crypto/verifying_key.h>
 #include <tarvel/xml/node.h>
 #include <tarvel/xml/security/exceptions.h>
 #include <tarvel/xml/security/key_info_resolver.h>
 #include <tarvel/xml/security/signature_report.h>
 
+#include <cstdint>
 #include <set>
 #include <string>
 #include <string_view>
@@ -57,6 +59,23 @@ public:
   /// @throws XmlSecurityException for an algorithm outside the profile, a reference that does not resolve to exactly one
   ///         node, a tree without a canonical form, or when no candidate key can be used with the signature's algorithm.
   virtual bool Verify(const KeyInfoResolver &resolver, std::set<std::string> &signedUris) const = 0;
+
+  /// What a signature covers, after its verification.
+  struct Coverage {
+    /// The target of a reference. What was signed is its canonical form.
+    struct Target {
+      const Node *node = nullptr;  ///< an element, or the document; never null; of the signature's tree
+      bool omitsSignature = false; ///< the target contains the signature itself, which is not part of what was signed
+    };
+    std::vector<Target> targets;                ///< in the order of the references
+    std::vector<std::uint8_t> signedInfoDigest; ///< of the canonical `SignedInfo`; the signature's value signs it
+  };
+
+  /// The same checks with one key, which need not have a certificate. The signature's `KeyInfo` is not read.
+  /// @param coverage is set if the result is true; otherwise it is unchanged.
+  /// @return false when a digest or the signature value is wrong.
+  /// @throws what the first `Verify` throws; TypeMismatchException for a key that this library has not made.
+  virtual bool Verify(const Crypto::VerifyingKey &key, Coverage &coverage) const = 0;
 
   /// Adds a reference to be signed, with one transform.
   /// @throws XmlSecurityException for a transform other than exclusive canonicalisation without comments, or a digest other
