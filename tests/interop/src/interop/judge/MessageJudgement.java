@@ -62,7 +62,7 @@ final class MessageJudgement {
     List<String> command = new ArrayList<>(List.of(tool.toString(), "sign", "--token", token.toString(), "--trust",
       issuers.get(kind.token()).toString(), "--profile", "saml2", "--out", output.toString()));
     if (kind.form() != MessageKinds.KeyForm.KEY_IDENTIFIER_OTHER_TYPE) {
-      command.addAll(List.of("--dialect-switch", "token-type-reference=standard"));
+      command.addAll(List.of("--token-type-reference", "standard"));
     }
     if (kind.isSigned()) {
       command.addAll(List.of("--key", maker.token(kind).holder().keyFile().toString()));
