@@ -155,7 +155,8 @@ final class MessageChanges {
       Element other = renamed(signed);
       setText(Xml.child(other, Xml.WSU, "Expires"), Instant.now().plus(1, ChronoUnit.HOURS).toString());
       security.replaceChild(other, signed);
-      header(document).appendChild(aside(signed));
+      // Inside of the security header, because the canonical form can contain the prefixes that are declared there.
+      security.appendChild(aside(signed));
       return true;
     });
     changes.put("whole message moved into a header", (document, security) -> {

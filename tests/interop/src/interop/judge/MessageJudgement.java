@@ -7,19 +7,22 @@ import java.util.ArrayList;
 import java.util.List;
 import java.util.Locale;
 import java.util.Map;
+import java.util.concurrent.ExecutorService;
+import java.util.concurrent.Executors;
+import java.util.concurrent.Future;
 
 /** Judges messages with tokens in both directions: WSS4J and xmlsec1 verify the tool's, and the tool verifies WSS4J's. */
 final class MessageJudgement {
+  private interface Judgement {
+    void judge(MessageKinds.Kind kind, Verdicts verdicts, Path folder) throws Exception;
+  }
+
+  private static final String SUCCESS = "exit status 0";
   private static final int NOT_ACCEPTED = 5;
   private static final int SIGNATURE_INVALID = 6;
 
-  private static final Map<String, String> REASONS = Map.of(MessageKinds.NO_PROOF,
-    "the signature refers to a certificate, not to the token", MessageKinds.TRANSFORM,
-    "the signature has a transform that the profile does not have");
-
   private final Verdicts verdicts;
   private final MessageJudge judge;
-  private final XmlsecJudge xmlsec;
   private final MessageMaker maker;
   private final Map<String, Path> issuers;
   private final Path tool;
@@ -30,7 +33,6 @@ final class MessageJudgement {
     Path folder) {
     this.verdicts = verdicts;
     this.judge = judge;
-    this.xmlsec = new XmlsecJudge(folder);
     this.maker = maker;
     this.issuers = issuers;
     this.tool = tool;
@@ -38,29 +40,31 @@ final class MessageJudgement {
   }
 
   void run() throws Exception {
-    verdicts.title("Messages that `ssoclient sign` made, judged by WSS4J and xmlsec1", "Message", "Tree engine",
-      "Stream engine", "xmlsec1", "`ssoclient check-message`", "Changed copies refused by WSS4J", "By the tool");
-    for (MessageKinds.Kind kind : MessageKinds.ofTool()) {
-      judgeOurs(kind);
-    }
-    verdicts.title("Messages that WSS4J made, judged by `ssoclient check-message`", "Message", "Key in the message",
-      "`ssoclient check-message`", "Changed copies refused");
-    for (MessageKinds.Kind kind : MessageKinds.ofWss4j()) {
-      judgeTheirs(kind);
-    }
+    judgeAllOurs();
+    judgeAllTheirs();
   }
 
-  /** A message that the tool signed. */
+  void judgeAllOurs() throws Exception {
+    verdicts.title("Messages that `ssoclient sign` made, judged by WSS4J and xmlsec1", "Message", "Tree engine",
+      "Stream engine", "xmlsec1", "`ssoclient check-message`", "Changed copies refused by WSS4J", "By the tool");
+    judgeAll(MessageKinds.ofTool(), this::judgeOurs);
+  }
+
+  void judgeAllTheirs() throws Exception {
+    verdicts.title("Messages that WSS4J made, judged by `ssoclient check-message`", "Message", "Key in the message",
+      "`ssoclient check-message`", "Changed copies refused");
+    judgeAll(MessageKinds.ofWss4j(), this::judgeTheirs);
+  }
+
+  /** A message that the tool signed. @throws IllegalStateException if it does not sign */
   String sign(MessageKinds.Kind kind) throws Exception {
-    Path input = folder.resolve("envelope.xml");
-    Path output = folder.resolve("signed.xml");
-    Files.deleteIfExists(output);
+    Path input = Files.createTempFile(folder, "envelope", ".xml");
     Files.writeString(input, kind.extra() == MessageKinds.Extra.OTHER_SIGNATURE ? maker.withOtherSignature(kind)
       : MessageMaker.plain(kind.soap(), kind.hasAddressing()));
-    Path token = folder.resolve("message-token.xml");
+    Path token = Files.createTempFile(folder, "token", ".xml");
     Files.writeString(token, maker.token(kind).xml());
     List<String> command = new ArrayList<>(List.of(tool.toString(), "sign", "--token", token.toString(), "--trust",
-      issuers.get(kind.token()).toString(), "--profile", "saml2", "--out", output.toString()));
+      issuers.get(kind.token()).toString(), "--profile", "saml2"));
     if (kind.form() != MessageKinds.KeyForm.KEY_IDENTIFIER_OTHER_TYPE) {
       command.addAll(List.of("--token-type-reference", "standard"));
     }
@@ -70,57 +74,75 @@ final class MessageJudgement {
     addRoleAndParts(command, kind);
     command.add(input.toString());
     Command.Outcome outcome = Command.run(folder, command);
-    verdicts.check("sign " + kind.name(), "exit status 0", outcome.summary());
-    return outcome.succeeded() ? Files.readString(output) : null;
+    if (!outcome.succeeded()) {
+      throw new IllegalStateException(kind.name() + ": " + outcome.summary());
+    }
+    return outcome.output();
   }
 
-  private void judgeOurs(MessageKinds.Kind kind) throws Exception {
-    String message = sign(kind);
-    if (message == null) {
-      return;
+  /** Judges all kinds, several at once, and adds the rows in their order. */
+  private void judgeAll(List<MessageKinds.Kind> kinds, Judgement judgement) throws Exception {
+    ExecutorService threads = Executors.newFixedThreadPool(Runtime.getRuntime().availableProcessors());
+    try {
+      List<Future<Verdicts>> rows = new ArrayList<>();
+      for (MessageKinds.Kind kind : kinds) {
+        rows.add(threads.submit(() -> {
+          Verdicts row = new Verdicts();
+          judgement.judge(kind, row, Files.createTempDirectory(folder, kind.name()));
+          return row;
+        }));
+      }
+      for (Future<Verdicts> row : rows) {
+        verdicts.add(row.get());
+      }
+    } finally {
+      threads.shutdownNow();
     }
+  }
+
+  private void judgeOurs(MessageKinds.Kind kind, Verdicts row, Path work) throws Exception {
+    String message = sign(kind);
     MessageJudge.Expected expected = MessageJudge.Expected.of(kind);
     String name = "ours, " + kind.name();
-    String asTree = verdicts.check(name + ", tree engine", EnvelopeJudge.VERIFIES,
-      judge.judgeAsTree(message, expected));
-    String asStream = verdicts.check(name + ", stream engine", EnvelopeJudge.VERIFIES,
+    String asTree = row.check(name + ", tree engine", EnvelopeJudge.VERIFIES, judge.judgeAsTree(message, expected));
+    String asStream = row.check(name + ", stream engine", EnvelopeJudge.VERIFIES,
       judge.judgeAsStream(message, expected));
-    String byXmlsec = kind.isSigned() ? verdicts.check(name + ", xmlsec1", XmlsecJudge.VERIFIES,
-      xmlsec.judge(message, maker.token(kind).holder().certificate())) : "not signed";
-    Command.Outcome outcome = check(kind, message);
-    String byTool = verdicts.check(name + ", tool", "exit status 0", outcome.summary());
+    String byXmlsec = kind.isSigned() ? row.check(name + ", xmlsec1", XmlsecJudge.VERIFIES,
+      new XmlsecJudge(work).judge(message, maker.token(kind).holder().certificate())) : "not signed";
+    String byTool = row.check(name + ", tool", SUCCESS, check(kind, message, work).summary());
     int refused = 0;
     int refusedByTool = 0;
     Map<String, String> copies = changedCopies(kind, message);
     for (Map.Entry<String, String> copy : copies.entrySet()) {
+      String subject = name + ", changed: " + copy.getKey();
       String answer = judge.judgeAsTree(copy.getValue(), expected);
       boolean isRefused = !answer.equals(EnvelopeJudge.VERIFIES);
-      verdicts.check(name + ", changed: " + copy.getKey() + ", WSS4J", TokenJudge.REFUSED,
-        isRefused ? TokenJudge.REFUSED : answer);
+      row.check(subject + ", WSS4J", TokenJudge.REFUSED, isRefused ? TokenJudge.REFUSED : answer);
       refused += isRefused ? 1 : 0;
-      refusedByTool += checkRefused(kind, name + ", changed: " + copy.getKey(), copy.getValue());
+      refusedByTool += checkRefused(row, subject, check(kind, copy.getValue(), work));
     }
-    verdicts.row(kind.name(), asTree, asStream, byXmlsec, byTool.equals("exit status 0") ? "accepted" : byTool,
+    row.row(kind.name(), asTree, asStream, byXmlsec, byTool.equals(SUCCESS) ? "accepted" : byTool,
       refused + " of " + copies.size(), refusedByTool + " of " + copies.size());
   }
 
-  private void judgeTheirs(MessageKinds.Kind kind) throws Exception {
+  private void judgeTheirs(MessageKinds.Kind kind, Verdicts row, Path work) throws Exception {
     String message = maker.make(kind);
     String name = "WSS4J's, " + kind.name();
     String form = kind.form().toString().toLowerCase(Locale.ROOT).replace('_', ' ');
+    Command.Outcome outcome = check(kind, message, work);
     if (!kind.refusal().isEmpty()) {
-      int refused = checkRefused(kind, name, message);
-      verdicts.row(kind.name(), form, refused == 1 ? "refused: " + REASONS.get(kind.refusal()) : "**accepted**", "");
+      checkRefused(row, name, outcome);
+      String found = outcome.errors().contains(kind.refusal()) ? kind.refusal() : outcome.summary();
+      row.row(kind.name(), form, "refused: " + row.check(name + ", reason", kind.refusal(), found), "");
       return;
     }
-    Command.Outcome outcome = check(kind, message);
-    String cell = verdicts.check(name, "exit status 0", outcome.summary());
+    String cell = row.check(name, SUCCESS, outcome.summary());
     int refused = 0;
     Map<String, String> copies = changedCopies(kind, message);
     for (Map.Entry<String, String> copy : copies.entrySet()) {
-      refused += checkRefused(kind, name + ", changed: " + copy.getKey(), copy.getValue());
+      refused += checkRefused(row, name + ", changed: " + copy.getKey(), check(kind, copy.getValue(), work));
     }
-    verdicts.row(kind.name(), form, cell.equals("exit status 0") ? "accepted" : cell, refused + " of " + copies.size());
+    row.row(kind.name(), form, cell.equals(SUCCESS) ? "accepted" : cell, refused + " of " + copies.size());
   }
 
   /** Changes with a token that the same service issued for another key. */
@@ -130,24 +152,23 @@ final class MessageJudgement {
   }
 
   /** The tool must refuse, and not fail for another reason. Returns 1 if it does. */
-  private int checkRefused(MessageKinds.Kind kind, String subject, String message) throws Exception {
-    Command.Outcome outcome = check(kind, message);
+  private static int checkRefused(Verdicts row, String subject, Command.Outcome outcome) {
     boolean isRefused = outcome.status() == NOT_ACCEPTED || outcome.status() == SIGNATURE_INVALID;
-    verdicts.check(subject + ", tool", TokenJudge.REFUSED, isRefused ? TokenJudge.REFUSED : outcome.summary());
+    row.check(subject + ", tool", TokenJudge.REFUSED, isRefused ? TokenJudge.REFUSED : outcome.summary());
     return isRefused ? 1 : 0;
   }
 
-  private Command.Outcome check(MessageKinds.Kind kind, String message) throws Exception {
-    Path file = folder.resolve("message.xml");
+  private Command.Outcome check(MessageKinds.Kind kind, String message, Path work) throws Exception {
+    Path file = work.resolve("message.xml");
     Files.writeString(file, message);
     List<String> command = new ArrayList<>(List.of(tool.toString(), "check-message", "--trust",
-      issuers.get(kind.token()).toString(), "--profile", "saml2", "--format", "json"));
+      issuers.get(kind.token()).toString(), "--profile", "saml2"));
     if (!kind.isSigned()) {
       command.add("--allow-bearer");
     }
     addRoleAndParts(command, kind);
     command.add(file.toString());
-    return Command.run(folder, command);
+    return Command.run(work, command);
   }
 
   private static void addRoleAndParts(List<String> command, MessageKinds.Kind kind) {

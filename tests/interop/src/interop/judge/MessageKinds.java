@@ -30,12 +30,16 @@ final class MessageKinds {
     /** A signature with another certificate, over the same parts; in a message that the tool signs, over the timestamp. */
     OTHER_SIGNATURE,
     /** The header "urn:orders" Priority, which is in every message. */
-    HEADER
+    HEADER,
+    /** Not the body, or not the timestamp. */
+    NO_BODY, NO_TIMESTAMP,
+    /** Nothing, but another key than the token's has signed. */
+    OTHER_KEY
   }
 
   /**
    * A message. `token` is the name of a token; an empty `role` is that of the last receiver. If `refusal` is not empty,
-   * it is the reason for which this project refuses the message although WSS4J accepts it.
+   * it is the reason for which this project refuses the message, and a part of its text.
    */
   record Kind(String name, String soap, String token, KeyForm form, Extra extra, boolean hasAddressing, String role,
     boolean hasPrefixLists, String algorithm, String refusal) {
@@ -71,10 +75,11 @@ final class MessageKinds {
   static final String RSA_SHA256 = "http://www.w3.org/2001/04/xmldsig-more#rsa-sha256";
   static final String RSA_SHA512 = "http://www.w3.org/2001/04/xmldsig-more#rsa-sha512";
   static final String RSA_PSS_SHA256 = "http://www.w3.org/2007/05/xmldsig-more#sha256-rsa-MGF1";
-  /** No signature in the message refers to the token, or has its key or certificate in the KeyInfo. */
-  static final String NO_PROOF = "no-proof";
-  /** The signature profile does not have the transform. */
-  static final String TRANSFORM = "transform";
+  static final String NO_PROOF = "The message has no signature by the token's key";
+  static final String TRANSFORM = "The signature of the message is not accepted: The transform algorithm";
+  static final String BODY = "The signature does not cover the body";
+  static final String TIMESTAMP = "The signature does not cover the timestamp";
+  static final String KEY = "The signature of the message is wrong: another key made it, or signed content was changed";
   static final String ROLE = "urn:gateway";
 
   private static final String ECDSA = "http://www.w3.org/2001/04/xmldsig-more#ecdsa-sha";
@@ -160,6 +165,12 @@ final class MessageKinds {
     kinds.add(kind("token-signed", Xml.SOAP, "strict", KeyForm.KEY_IDENTIFIER).withExtra(Extra.TOKEN_BY_ID));
     kinds.add(kind("token-signed-by-reference", Xml.SOAP, "strict", KeyForm.KEY_IDENTIFIER)
       .withExtra(Extra.TOKEN_BY_REFERENCE).refusedWith(TRANSFORM));
+    kinds.add(kind("body-not-signed", Xml.SOAP, "strict", KeyForm.KEY_IDENTIFIER).withExtra(Extra.NO_BODY)
+      .refusedWith(BODY));
+    kinds.add(kind("timestamp-not-signed", Xml.SOAP, "strict", KeyForm.KEY_IDENTIFIER).withExtra(Extra.NO_TIMESTAMP)
+      .refusedWith(TIMESTAMP));
+    kinds.add(kind("other-key", Xml.SOAP, "rsa-certificate", KeyForm.KEY_IDENTIFIER).withExtra(Extra.OTHER_KEY)
+      .refusedWith(KEY));
     kinds.add(kind("other-signature", Xml.SOAP, "rsa-certificate", KeyForm.KEY_IDENTIFIER)
       .withExtra(Extra.OTHER_SIGNATURE));
   }

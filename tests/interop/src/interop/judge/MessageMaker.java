@@ -87,14 +87,18 @@ final class MessageMaker {
     if (kind.extra() == MessageKinds.Extra.TOKEN_BY_ID || kind.extra() == MessageKinds.Extra.TOKEN_BY_REFERENCE) {
       names.add("Assertion");
     }
-    names.add("Timestamp");
+    if (kind.extra() != MessageKinds.Extra.NO_TIMESTAMP) {
+      names.add("Timestamp");
+    }
     if (kind.extra() == MessageKinds.Extra.HEADER) {
       names.add("Priority");
     }
     if (kind.hasAddressing()) {
       names.addAll(ADDRESSING);
     }
-    names.add("Body");
+    if (kind.extra() != MessageKinds.Extra.NO_BODY) {
+      names.add("Body");
+    }
     return names;
   }
 
@@ -175,7 +179,8 @@ final class MessageMaker {
         signature.getParts().add(new WSEncryptionPart("STRTransform", "", "Element"));
       default -> { }
     }
-    signature.build(crypto(token(kind).holder()), new SamlAssertionWrapper(assertion), null, null, null);
+    Identity signer = kind.extra() == MessageKinds.Extra.OTHER_KEY ? other : token(kind).holder();
+    signature.build(crypto(signer), new SamlAssertionWrapper(assertion), null, null, null);
   }
 
   /** Signs with the key itself, or a reference to its certificate; the token is beside the signature. */
@@ -207,8 +212,12 @@ final class MessageMaker {
 
   private static List<WSEncryptionPart> parts(MessageKinds.Kind kind) {
     List<WSEncryptionPart> parts = new ArrayList<>();
-    parts.add(new WSEncryptionPart("Body", kind.soap(), "Element"));
-    parts.add(new WSEncryptionPart("Timestamp", Xml.WSU, "Element"));
+    if (kind.extra() != MessageKinds.Extra.NO_BODY) {
+      parts.add(new WSEncryptionPart("Body", kind.soap(), "Element"));
+    }
+    if (kind.extra() != MessageKinds.Extra.NO_TIMESTAMP) {
+      parts.add(new WSEncryptionPart("Timestamp", Xml.WSU, "Element"));
+    }
     if (kind.extra() == MessageKinds.Extra.HEADER) {
       parts.add(new WSEncryptionPart("Priority", ORDERS, "Element"));
     }
