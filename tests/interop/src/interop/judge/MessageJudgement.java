@@ -110,6 +110,10 @@ final class MessageJudgement {
     String byXmlsec = kind.isSigned() ? row.check(name + ", xmlsec1", XmlsecJudge.VERIFIES,
       new XmlsecJudge(work).judge(message, maker.token(kind).holder().certificate())) : "not signed";
     String byTool = row.check(name + ", tool", SUCCESS, check(kind, message, work).summary());
+    // Without this, it could be the writing of the copies that is refused, and not the changes.
+    String copied = Xml.write(Xml.parse(message));
+    row.check(name + ", copied, tree engine", EnvelopeJudge.VERIFIES, judge.judgeAsTree(copied, expected));
+    row.check(name + ", copied, tool", SUCCESS, check(kind, copied, work).summary());
     int refused = 0;
     int refusedByTool = 0;
     Map<String, String> copies = changedCopies(kind, message);
