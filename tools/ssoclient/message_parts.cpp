@@ -2,7 +2,6 @@
 
 #include "message_parts.h"
 
-#include "exit_code.h"
 #include "option.h"
 
 namespace SsoClient::Tool {
