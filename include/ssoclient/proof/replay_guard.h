@@ -40,9 +40,23 @@ protected:
   ~ReplayGuard() = default;
 };
 
-/// A guard in the memory of this process. It remembers at most `capacity` messages that have not expired, and answers
-/// UNAVAILABLE to more. It takes at most TODO bytes for each, all of them from the beginning.
-/// @throws Tarvel::InvalidArgumentException when `capacity` is 0 or more than TODO. @throws std::bad_alloc
+/// The largest capacity of a guard in memory.
+constexpr std::size_t MAX_MEMORY_REPLAY_GUARD_CAPACITY = 100'000'000;
+
+/// A guard in the memory of this process. It remembers at most `capacity` messages, and answers UNAVAILABLE to more. Messages
+/// that have expired are removed gradually, a few in each call. While at most four fifths of `capacity` have not expired, a
+/// new message always has a place.
+///
+/// It uses at most 56 bytes for each message of `capacity` and less than 1 KiB in addition, all of them from the beginning. A
+/// call never waits for many messages that expire at once.
+///
+/// The clock is that of the machine. The guard also answers UNAVAILABLE, and remembers nothing, if `until` is not in the
+/// future. After the clock was set back, it does the same up to the latest `until` of a message that it has removed. So of all
+/// calls with one identifier and one `until`, only one is ever answered FIRST, even if the clock changes.
+///
+/// A child made by `fork` gets a copy of the guard. After that, parent and child do not know each other's messages.
+/// @throws Tarvel::InvalidArgumentException when `capacity` is 0 or more than `MAX_MEMORY_REPLAY_GUARD_CAPACITY`.
+/// @throws std::bad_alloc. @throws std::exception when the machine has no source of random numbers.
 SSOCLIENT_API std::shared_ptr<ReplayGuard> CreateMemoryReplayGuard(std::size_t capacity);
 
 } // namespace SsoClient

@@ -1,0 +1,22 @@
+// SPDX-License-Identifier: Apache-2.0
+/// @file
+/// SipHash-2-4 of identifiers (Aumasson and Bernstein, "SipHash: a fast short-input PRF", 2012).
+
+#pragma once
+
+#include <ssoclient/proof/replay_guard.h>
+
+#include <cstdint>
+
+namespace SsoClient {
+
+/// A key of SipHash: its octets 0 to 7 and 8 to 15, each as a little-endian number.
+struct SipHashKey {
+  std::uint64_t low = 0;
+  std::uint64_t high = 0;
+};
+
+/// SipHash-2-4 of the 32 octets. Without the key, it cannot be predicted, and identifiers with similar values cannot be found.
+std::uint64_t ComputeSipHash(const SipHashKey &key, const MessageIdentifier &identifier) noexcept;
+
+} // namespace SsoClient

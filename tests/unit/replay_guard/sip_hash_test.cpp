@@ -1,0 +1,59 @@
+// SPDX-License-Identifier: Apache-2.0
+// The hash is compared with OpenSSL's.
+#include "proof/sip_hash.h"
+
+#include <gtest/gtest.h>
+#include <openssl/evp.h>
+#include <openssl/params.h>
+
+#include <array>
+#include <cstddef>
+#include <cstdint>
+#include <memory>
+#include <random>
+
+namespace ReplayGuardTest {
+namespace {
+
+using SsoClient::MessageIdentifier;
+
+std::uint64_t ReadNumber(const std::uint8_t *bytes) {
+  std::uint64_t number = 0;
+  for (int i = 7; i >= 0; --i) {
+    number = number << 8 | bytes[i];
+  }
+  return number;
+}
+
+std::uint64_t HashByOpenSsl(const std::array<std::uint8_t, 16> &key, const MessageIdentifier &identifier) {
+  const std::unique_ptr<EVP_MAC, void (*)(EVP_MAC *)> method(EVP_MAC_fetch(nullptr, "SIPHASH", nullptr), &EVP_MAC_free);
+  const std::unique_ptr<EVP_MAC_CTX, void (*)(EVP_MAC_CTX *)> context(EVP_MAC_CTX_new(method.get()), &EVP_MAC_CTX_free);
+  std::size_t size = 8;
+  const std::array<OSSL_PARAM, 2> parameters{OSSL_PARAM_construct_size_t("size", &size), OSSL_PARAM_construct_end()};
+  std::array<std::uint8_t, 8> value{};
+  std::size_t length = 0;
+  EXPECT_EQ(EVP_MAC_init(context.get(), key.data(), key.size(), parameters.data()), 1);
+  EXPECT_EQ(EVP_MAC_update(context.get(), identifier.data(), identifier.size()), 1);
+  EXPECT_EQ(EVP_MAC_final(context.get(), value.data(), &length, value.size()), 1);
+  EXPECT_EQ(length, value.size());
+  return ReadNumber(value.data());
+}
+
+TEST(ComputeSipHash, IsTheHashThatOpenSslComputes) {
+  std::mt19937_64 random(1);
+  for (int i = 0; i < 1000; ++i) {
+    std::array<std::uint8_t, 16> key{};
+    MessageIdentifier identifier{};
+    for (std::uint8_t &octet : key) {
+      octet = static_cast<std::uint8_t>(random());
+    }
+    for (std::uint8_t &octet : identifier) {
+      octet = static_cast<std::uint8_t>(random());
+    }
+    EXPECT_EQ(SsoClient::ComputeSipHash({ReadNumber(key.data()), ReadNumber(key.data() + 8)}, identifier),
+              HashByOpenSsl(key, identifier));
+  }
+}
+
+} // namespace
+} // namespace ReplayGuardTest
