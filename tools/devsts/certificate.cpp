@@ -3,6 +3,7 @@
 #include "certificate.h"
 
 #include "base64.h"
+#include "digest.h"
 
 #include <openssl/err.h>
 #include <openssl/x509_vfy.h>
@@ -25,15 +26,26 @@ struct StoreContextDeleter {
   void operator()(X509_STORE_CTX *context) const noexcept { X509_STORE_CTX_free(context); }
 };
 
-std::vector<unsigned char> DerOf(const X509 &certificate) {
-  unsigned char *der = nullptr;
-  const int length = i2d_X509(&certificate, &der);
+/// `der` has `length` octets, and is freed.
+std::vector<unsigned char> TakeDer(unsigned char *der, int length) {
   if (length < 0) {
     throw std::bad_alloc();
   }
   std::vector<unsigned char> copy(der, der + length);
   OPENSSL_free(der);
   return copy;
+}
+
+std::vector<unsigned char> DerOf(const X509 &certificate) {
+  unsigned char *der = nullptr;
+  const int length = i2d_X509(&certificate, &der);
+  return TakeDer(der, length);
+}
+
+std::vector<unsigned char> DerOf(const X509_PUBKEY &key) {
+  unsigned char *der = nullptr;
+  const int length = i2d_X509_PUBKEY(&key, &der);
+  return TakeDer(der, length);
 }
 
 /// The entry of that kind in the name; empty unless there is exactly one.
@@ -64,16 +76,11 @@ std::string EncodeCertificate(const X509 &certificate) {
 }
 
 std::string ThumbprintOf(const X509 &certificate) {
-  std::array<unsigned char, EVP_MAX_MD_SIZE> digest{};
-  unsigned length = 0;
-  X509_digest(&certificate, EVP_sha256(), digest.data(), &length);
-  constexpr std::string_view DIGITS = "0123456789abcdef";
-  std::string text;
-  for (unsigned i = 0; i < length; ++i) {
-    text += DIGITS[digest[i] >> 4u];
-    text += DIGITS[digest[i] & 15u];
-  }
-  return text;
+  return Sha256Text(DerOf(certificate));
+}
+
+std::string KeyThumbprintOf(const X509 &certificate) {
+  return Sha256Text(DerOf(*X509_get_X509_PUBKEY(&certificate)));
 }
 
 bool HasStrongKey(const X509 &certificate) {

@@ -31,6 +31,9 @@ std::string EncodeCertificate(const X509 &certificate);
 /// The SHA-256 digest of the DER form, as 64 lower-case hexadecimal digits.
 std::string ThumbprintOf(const X509 &certificate);
 
+/// The SHA-256 digest of the public key (its SubjectPublicKeyInfo), as 64 lower-case hexadecimal digits.
+std::string KeyThumbprintOf(const X509 &certificate);
+
 /// Whether the key is RSA of at least 2048 bits.
 bool HasStrongKey(const X509 &certificate);
 

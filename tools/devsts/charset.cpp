@@ -84,8 +84,8 @@ std::string Charset::Encode(const std::string &answer) const {
   return "<?xml version=\"1.0\" encoding=\"" + m_name + "\"?>" + ToString(*buffer);
 }
 
-std::string Charset::ContentType() const {
-  return "text/xml; charset=" + (IsUtf8() ? "utf-8" : m_name);
+std::string Charset::ContentType(std::string_view mediaType) const {
+  return std::string(mediaType) + "; charset=" + (IsUtf8() ? "utf-8" : m_name);
 }
 
 bool Charset::IsUtf8() const {

@@ -25,8 +25,8 @@ public:
   /// charset but UTF-8, the answer begins with an XML declaration.
   std::string Encode(const std::string &answer) const;
 
-  /// The answers' media type.
-  std::string ContentType() const;
+  /// The `Content-Type` of answers with this media type.
+  std::string ContentType(std::string_view mediaType) const;
 
 private:
   bool IsUtf8() const;

@@ -158,6 +158,7 @@ HttpRequest Connection::TakeRequest() {
   request.soapAction = Field(message, "SOAPAction");
   request.keepOpen = message.keep_alive();
   request.body = std::move(message.body());
+  request.peerCertificate.reset(SSL_get1_peer_certificate(m_stream.native_handle()));
   return request;
 }
 

@@ -17,6 +17,7 @@
 #include <atomic>
 #include <chrono>
 #include <deque>
+#include <string_view>
 #include <thread>
 #include <utility>
 #include <vector>
@@ -56,6 +57,14 @@ bool LacksIpV6(const boost::system::system_error &failure) {
          failure.code() == boost::system::errc::address_not_available;
 }
 
+void AskForCertificates(asio::ssl::context &tls) {
+  tls.set_verify_mode(asio::ssl::verify_peer);
+  tls.set_verify_callback([](bool, asio::ssl::verify_context &) { return true; });
+  constexpr std::string_view SESSIONS = "devsts"; // OpenSSL resumes no authenticated session without a context
+  SSL_CTX_set_session_id_context(tls.native_handle(), reinterpret_cast<const unsigned char *>(SESSIONS.data()),
+                                 static_cast<unsigned>(SESSIONS.size()));
+}
+
 void SetUpTls(asio::ssl::context &tls, const Identity &identity) {
   tls.use_certificate_chain_file(identity.certificateFile.string());
   tls.use_private_key_file(identity.keyFile.string(), asio::ssl::context::pem);
@@ -66,7 +75,7 @@ void SetUpTls(asio::ssl::context &tls, const Identity &identity) {
 
 class HttpsListener::Server {
 public:
-  Server(const Identity &identity, std::uint16_t port, const RequestHandler &handler);
+  Server(const Identity &identity, std::uint16_t port, bool asksForCertificates, const RequestHandler &handler);
   Server(const Server &) = delete;
   Server &operator=(const Server &) = delete;
   ~Server();
@@ -87,9 +96,12 @@ private:
   std::vector<std::thread> m_threads;
 };
 
-HttpsListener::Server::Server(const Identity &identity, std::uint16_t port, const RequestHandler &handler)
+HttpsListener::Server::Server(const Identity &identity, std::uint16_t port, bool asksForCertificates, const RequestHandler &handler)
     : m_tls(asio::ssl::context::tls_server), m_handler(handler) {
   SetUpTls(m_tls, identity);
+  if (asksForCertificates) {
+    AskForCertificates(m_tls);
+  }
   Listen(port);
 }
 
@@ -144,8 +156,9 @@ void HttpsListener::Server::Accept(tcp::acceptor &acceptor) {
   });
 }
 
-HttpsListener::HttpsListener(const Identity &identity, std::uint16_t port, const RequestHandler &handler)
-    : m_server(std::make_unique<Server>(identity, port, handler)) {}
+HttpsListener::HttpsListener(const Identity &identity, std::uint16_t port, bool asksForCertificates,
+                             const RequestHandler &handler)
+    : m_server(std::make_unique<Server>(identity, port, asksForCertificates, handler)) {}
 
 HttpsListener::~HttpsListener() = default;
 

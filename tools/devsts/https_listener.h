@@ -16,7 +16,9 @@ class HttpsListener {
 public:
   /// Listens on 127.0.0.1 and, where the machine has it, on ::1. Port 0 chooses a free port, the same for both
   /// addresses. `handler` outlives the listener. @throws std::exception when that is not possible
-  HttpsListener(const Identity &identity, std::uint16_t port, const RequestHandler &handler);
+  /// @param asksForCertificates of clients, which need not have one. A certificate of any issuer is accepted, so it
+  /// proves its key and nothing else.
+  HttpsListener(const Identity &identity, std::uint16_t port, bool asksForCertificates, const RequestHandler &handler);
   HttpsListener(const HttpsListener &) = delete;
   HttpsListener &operator=(const HttpsListener &) = delete;
   /// Closes all connections at once.

@@ -2,6 +2,7 @@
 /// @file
 /// The development token service: starts, writes the ready line, and serves until it must end.
 
+#include "echo_service.h"
 #include "https_listener.h"
 #include "options.h"
 #include "request_handler.h"
@@ -39,6 +40,7 @@ void RaiseDescriptorLimit() {
 void WriteReadyLine(const StateFolder &state, std::uint16_t port) {
   const nlohmann::ordered_json ready = {{"schema", 1},
                                         {"url", "https://localhost:" + std::to_string(port) + "/sts"},
+                                        {"echo", "https://localhost:" + std::to_string(port) + "/echo"},
                                         {"port", port},
                                         {"pid", getpid()},
                                         {"ca", state.authority.certificateFile.string()},
@@ -57,8 +59,9 @@ void Serve(const Options &options) {
   const StateFolder state = OpenStateFolder(options.state);
   const TokenService service(state, std::move(users), options.tolerance,
                              options.keytab ? CreateGssAcceptor(*options.keytab, options.state / "replays") : nullptr);
-  const RequestHandler handler(service, options.fault, Charset(options.charset));
-  HttpsListener listener(state.tls, options.port, handler);
+  const EchoService echo(state, options.tolerance, options.acceptsBearer);
+  const RequestHandler handler(service, echo, options.fault, Charset(options.charset));
+  HttpsListener listener(state.tls, options.port, options.asksForCertificates, handler);
   listener.Start();
   WriteReadyLine(state, listener.GetPort());
   endSignals.Wait(options.untilEof);

@@ -2,67 +2,22 @@
 
 #include "message_check.h"
 
+#include "security_header.h"
 #include "token_reader.h"
-
-#include <algorithm>
-#include <set>
 
 namespace DevSts {
 
 namespace {
 
-constexpr std::chrono::hours LONGEST_MESSAGE_LIFE(24);
 constexpr const char *COVERAGE =
     "the signature must cover the body and the timestamp, and nothing else but headers of WS-Addressing";
 constexpr const char *HEADERS = "the message must have one security header and no other";
-
-/// The elements that the security header may have, each at most once.
-struct SecurityHeader {
-  xmlNode *timestamp = nullptr;
-  xmlNode *usernameToken = nullptr;
-  xmlNode *binaryToken = nullptr;
-  xmlNode *assertion = nullptr;
-  xmlNode *signature = nullptr;
-};
 
 struct Envelope {
   xmlNode *body = nullptr;
   std::vector<const xmlNode *> addressing; ///< the header elements of WS-Addressing, whose content is not examined
   SecurityHeader security;
 };
-
-[[noreturn]] void RefuseSecurity(const std::string &reason) {
-  throw Refusal(Code::INVALID_SECURITY, reason);
-}
-
-SecurityHeader ReadSecurityHeader(const xmlNode &security) {
-  SecurityHeader header;
-  const struct {
-    Namespace ns;
-    const char *name;
-    xmlNode *SecurityHeader::*place;
-  } parts[] = {{Ns::WSU, "Timestamp", &SecurityHeader::timestamp},
-               {Ns::WSSE, "UsernameToken", &SecurityHeader::usernameToken},
-               {Ns::WSSE, "BinarySecurityToken", &SecurityHeader::binaryToken},
-               {Ns::SAML, "Assertion", &SecurityHeader::assertion},
-               {Ns::DS, "Signature", &SecurityHeader::signature}};
-  for (xmlNode *child : ChildElements(security)) {
-    const auto *const part = std::find_if(std::begin(parts), std::end(parts),
-                                          [&](const auto &known) { return IsElement(*child, known.ns, known.name); });
-    if (part == std::end(parts)) {
-      throw Refusal(Code::UNSUPPORTED_TOKEN, "unknown element in the security header: '" +
-                                                 std::string(reinterpret_cast<const char *>(child->name)) + "'");
-    }
-    if (header.*part->place) {
-      RefuseSecurity(std::string("several ") + part->name + " in the security header");
-    }
-    header.*part->place = child;
-  }
-  if (!header.timestamp) {
-    RefuseSecurity("no timestamp");
-  }
-  return header;
-}
 
 Envelope ReadEnvelope(const xmlDoc &document) {
   const xmlNode &root = *xmlDocGetRootElement(&document);
@@ -95,29 +50,6 @@ Envelope ReadEnvelope(const xmlDoc &document) {
   return envelope;
 }
 
-Time ReadTime(const xmlNode &timestamp, const char *name) {
-  const std::optional<Time> time = ParseTime(TextOf(RequireChild(timestamp, Ns::WSU, name)));
-  if (!time) {
-    RefuseSecurity(std::string(name) + " of the timestamp is not a UTC date");
-  }
-  return *time;
-}
-
-void CheckTimestamp(const xmlNode &timestamp, std::chrono::seconds tolerance) {
-  const Time created = ReadTime(timestamp, "Created");
-  const Time expires = ReadTime(timestamp, "Expires");
-  const Time now = Now();
-  if (expires <= created || expires - created > LONGEST_MESSAGE_LIFE) {
-    RefuseSecurity("the timestamp's period is empty or too long");
-  }
-  if (created > now + tolerance) {
-    RefuseSecurity("the timestamp is in the future");
-  }
-  if (expires + tolerance <= now) {
-    throw Refusal(Code::MESSAGE_EXPIRED, "the message has expired");
-  }
-}
-
 PasswordCredentials ReadCredentials(const xmlNode &usernameToken) {
   const xmlNode &password = RequireChild(usernameToken, Ns::WSSE, "Password");
   if (AttributeOf(password, "Type").value_or(PASSWORD_TEXT_TYPE) != PASSWORD_TEXT_TYPE) {
@@ -128,21 +60,11 @@ PasswordCredentials ReadCredentials(const xmlNode &usernameToken) {
 
 /// The signature must cover the body and the timestamp of this envelope, each once. It may also cover the header
 /// elements of WS-Addressing, each once, but nothing else.
-void RequireCoverage(const Envelope &envelope, const Identifiers &identifiers) {
-  std::set<const xmlNode *> uncovered = {envelope.body, envelope.security.timestamp};
-  std::set<const xmlNode *> optional(envelope.addressing.begin(), envelope.addressing.end());
-  for (const SignatureReference &reference : ReadReferences(*envelope.security.signature)) {
-    const auto found = identifiers.find(reference.id);
-    if (reference.isEnveloped || found == identifiers.end()) {
-      RefuseSecurity("the signature refers to an element that does not exist");
-    }
-    if (uncovered.erase(found->second) + optional.erase(found->second) == 0) {
-      RefuseSecurity(COVERAGE);
-    }
-  }
-  if (!uncovered.empty()) {
-    RefuseSecurity(COVERAGE);
-  }
+void CheckCoverage(const Envelope &envelope, const Identifiers &identifiers) {
+  RequireCoverage(*envelope.security.signature, identifiers,
+                  {{envelope.body, envelope.security.timestamp},
+                   {envelope.addressing.begin(), envelope.addressing.end()},
+                   COVERAGE});
 }
 
 /// The certificate in the binary token, to which `reference` must refer.
@@ -162,8 +84,7 @@ Certificate BinaryTokenCertificate(const Envelope &envelope, const Identifiers &
 
 /// The certificate of the key that the presented assertion is bound to.
 Certificate HolderCertificate(const Envelope &envelope, const CheckedMessage &message, const xmlNode &keyIdentifier) {
-  if (!message.presentedToken || AttributeOf(keyIdentifier, "ValueType").value_or("") != SAML_ID_VALUE_TYPE ||
-      TextOf(keyIdentifier) != AttributeOf(*envelope.security.assertion, "ID")) {
+  if (!message.presentedToken || !Identifies(keyIdentifier, *envelope.security.assertion)) {
     throw Refusal(Code::TOKEN_UNAVAILABLE, "the signature's key reference does not refer to a token of the message");
   }
   if (message.presentedToken->certificate.empty()) {
@@ -191,7 +112,7 @@ Certificate SignerCertificate(const Envelope &envelope, const CheckedMessage &me
 }
 
 void CheckSignature(const Envelope &envelope, CheckedMessage &message) {
-  RequireCoverage(envelope, message.identifiers);
+  CheckCoverage(envelope, message.identifiers);
   Certificate signer = SignerCertificate(envelope, message);
   if (!VerifiesWith(*envelope.security.signature, PublicKeyOf(*signer))) {
     throw Refusal(Code::FAILED_CHECK, "the message's signature is wrong");

@@ -14,7 +14,9 @@ struct Namespace {
 
 namespace Ns {
 constexpr Namespace SOAPENV{"soapenv", "http://schemas.xmlsoap.org/soap/envelope/"};
+constexpr Namespace SOAP12{"env", "http://www.w3.org/2003/05/soap-envelope"};
 constexpr Namespace WSSE{"wsse", "http://docs.oasis-open.org/wss/2004/01/oasis-200401-wss-wssecurity-secext-1.0.xsd"};
+constexpr Namespace WSSE11{"wsse11", "http://docs.oasis-open.org/wss/oasis-wss-wssecurity-secext-1.1.xsd"};
 constexpr Namespace WSU{"wsu", "http://docs.oasis-open.org/wss/2004/01/oasis-200401-wss-wssecurity-utility-1.0.xsd"};
 constexpr Namespace WST{"wst", "http://docs.oasis-open.org/ws-sx/ws-trust/200512"};
 constexpr Namespace WST14{"wst14", "http://docs.oasis-open.org/ws-sx/ws-trust/200802"};
@@ -25,6 +27,7 @@ constexpr Namespace XSI{"xsi", "http://www.w3.org/2001/XMLSchema-instance"};
 constexpr Namespace DELEGATION{"del", "urn:oasis:names:tc:SAML:2.0:conditions:delegation"};
 constexpr Namespace ADVICE{"rsa-advice", SSOCLIENT_EXTENSION_AUTHORITY "/names/2009/12/std-ext/WS-Trust1.4/advice"};
 constexpr Namespace EXTENSION{"rsa", SSOCLIENT_EXTENSION_AUTHORITY "/names/2009/12/std-ext/SAML2.0"};
+constexpr Namespace ECHO{"echo", "https://localhost/echo"};
 } // namespace Ns
 
 constexpr const char *EXCLUSIVE_C14N = "http://www.w3.org/2001/10/xml-exc-c14n#";
@@ -55,6 +58,7 @@ constexpr const char *SPNEGO_VALUE_TYPE = "http://schemas.xmlsoap.org/ws/2005/02
 constexpr const char *X509_VALUE_TYPE =
     "http://docs.oasis-open.org/wss/2004/01/oasis-200401-wss-x509-token-profile-1.0#X509v3";
 constexpr const char *SAML_ID_VALUE_TYPE = "http://docs.oasis-open.org/wss/oasis-wss-saml-token-profile-1.1#SAMLID";
+constexpr const char *ULTIMATE_RECEIVER = "http://www.w3.org/2003/05/soap-envelope/role/ultimateReceiver";
 constexpr const char *PASSWORD_TEXT_TYPE =
     "http://docs.oasis-open.org/wss/2004/01/oasis-200401-wss-username-token-profile-1.0#PasswordText";
 

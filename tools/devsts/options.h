@@ -24,6 +24,8 @@ struct Options {
   std::string charset = "UTF-8";
   std::chrono::seconds tolerance{60};
   bool untilEof = false;
+  bool acceptsBearer = false;       ///< of the echo service
+  bool asksForCertificates = false; ///< of clients, in the TLS handshake
 };
 
 /// Returns the options. When the command line is wrong or asks for help, writes the error or the help, and returns the

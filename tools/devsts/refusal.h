@@ -19,6 +19,8 @@ struct FaultCode {
 namespace Code {
 // SOAP 1.1
 constexpr FaultCode CLIENT{Ns::SOAPENV, "Client"};
+constexpr FaultCode SERVER{Ns::SOAPENV, "Server"};
+constexpr FaultCode MUST_UNDERSTAND{Ns::SOAPENV, "MustUnderstand"};
 // Web Services Security 1.1
 constexpr FaultCode UNSUPPORTED_TOKEN{Ns::WSSE, "UnsupportedSecurityToken"};
 constexpr FaultCode UNSUPPORTED_ALGORITHM{Ns::WSSE, "UnsupportedAlgorithm"};

@@ -16,7 +16,9 @@ namespace {
 constexpr std::string_view PATH = "/sts";
 constexpr std::string_view FAULT_PATH = "/sts/fault/";
 constexpr std::string_view ONCE = "/once/"; // follows the name of a fault; each path with it is counted separately
-constexpr std::string_view MEDIA_TYPE = "text/xml";
+constexpr std::string_view ECHO_PATH = "/echo";
+constexpr const char *ONLY_POST = "Only POST is answered.\n";
+constexpr const char *WRONG_CHARSET = "The message is not in the service's charset.\n";
 
 std::string Lower(std::string_view text) {
   std::string lower(text);
@@ -26,10 +28,10 @@ std::string Lower(std::string_view text) {
   return lower;
 }
 
-bool IsXml(std::string_view contentType) {
+/// The media type in lower case, without parameters.
+std::string MediaTypeOf(std::string_view contentType) {
   const std::string type = Lower(contentType.substr(0, contentType.find(';')));
-  const std::size_t end = type.find_last_not_of(" \t");
-  return end != std::string::npos && type.substr(0, end + 1) == MEDIA_TYPE;
+  return type.substr(0, type.find_last_not_of(" \t") + 1);
 }
 
 std::string_view Unquoted(std::string_view text) {
@@ -61,20 +63,24 @@ void LogLine(const std::string &line) noexcept {
 }
 
 Delivery RequestHandler::Answer(const HttpRequest &request) const {
-  Fault fault = m_fault;
-  if (request.target.rfind(FAULT_PATH, 0) == 0) {
-    const std::optional<Fault> named = FaultOf(std::string_view(request.target).substr(FAULT_PATH.size()));
-    if (!named) {
-      return Plain(404, "No fault of that name.\n", request.keepOpen);
-    }
-    fault = *named;
-  } else if (request.target != PATH) {
+  if (request.target == ECHO_PATH) {
+    return AnswerEcho(request);
+  }
+  if (request.target == PATH) {
+    return AnswerRequest(request, m_fault);
+  }
+  if (request.target.rfind(FAULT_PATH, 0) != 0) {
     return Plain(404, "The service is at /sts.\n", request.keepOpen);
   }
+  const std::optional<Fault> named = FaultOf(std::string_view(request.target).substr(FAULT_PATH.size()));
+  return named ? AnswerRequest(request, *named) : Plain(404, "No fault of that name.\n", request.keepOpen);
+}
+
+Delivery RequestHandler::AnswerRequest(const HttpRequest &request, const Fault &fault) const {
   if (request.method != "POST") {
-    return Plain(405, "Only POST is answered.\n", request.keepOpen);
+    return Plain(405, ONLY_POST, request.keepOpen);
   }
-  if (!IsXml(request.contentType)) {
+  if (MediaTypeOf(request.contentType) != SOAP_1_1.mediaType) {
     return Plain(415, "A SOAP 1.1 message has the media type text/xml.\n", request.keepOpen);
   }
   if (IgnoresRequest(fault.delivery)) {
@@ -83,13 +89,35 @@ Delivery RequestHandler::Answer(const HttpRequest &request) const {
   }
   const std::optional<std::string> message = m_charset.Decode(request.body);
   if (!message) {
-    return Plain(400, "The message is not in the service's charset.\n", request.keepOpen);
+    return Plain(400, WRONG_CHARSET, request.keepOpen);
   }
   const SoapAnswer answer = m_service.Answer(Unquoted(request.soapAction), *message, fault);
+  return AnswerWith(request, answer, SOAP_1_1.mediaType, fault);
+}
+
+Delivery RequestHandler::AnswerEcho(const HttpRequest &request) const {
+  if (request.method != "POST") {
+    return Plain(405, ONLY_POST, request.keepOpen);
+  }
+  const std::string type = MediaTypeOf(request.contentType);
+  if (type != SOAP_1_1.mediaType && type != SOAP_1_2.mediaType) {
+    return Plain(415, "A SOAP message has the media type text/xml or application/soap+xml.\n", request.keepOpen);
+  }
+  const std::optional<std::string> message = m_charset.Decode(request.body);
+  if (!message) {
+    return Plain(400, WRONG_CHARSET, request.keepOpen);
+  }
+  const SoapVersion &version = type == SOAP_1_2.mediaType ? SOAP_1_2 : SOAP_1_1;
+  const SoapAnswer answer = m_echo.Answer(*message, version, request.peerCertificate.get());
+  return AnswerWith(request, answer, version.mediaType, Fault());
+}
+
+Delivery RequestHandler::AnswerWith(const HttpRequest &request, const SoapAnswer &answer, std::string_view mediaType,
+                                    const Fault &fault) const {
   LogLine(request.peer + " " + request.target + ": " + answer.log);
   HttpAnswer http;
   http.status = answer.status;
-  http.contentType = m_charset.ContentType();
+  http.contentType = m_charset.ContentType(mediaType);
   http.body = m_charset.Encode(answer.body);
   return Deliver(http, fault, request.keepOpen);
 }

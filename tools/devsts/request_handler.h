@@ -4,8 +4,10 @@
 
 #pragma once
 
+#include "certificate.h"
 #include "charset.h"
 #include "delivery.h"
+#include "echo_service.h"
 #include "token_service.h"
 
 #include <functional>
@@ -25,26 +27,32 @@ struct HttpRequest {
   std::string soapAction;
   std::string body;
   bool keepOpen = true;
+  Certificate peerCertificate; ///< of the TLS client; null when it has none
 };
 
 /// Any number of threads may use it at once.
 class RequestHandler {
 public:
-  /// `service` outlives the handler. `fault` is for every request whose path has no fault; `charset` is for every
-  /// message.
-  RequestHandler(const TokenService &service, const Fault &fault, const Charset &charset)
-      : m_service(service), m_fault(fault), m_charset(charset) {}
+  /// The services outlive the handler. `fault` is for every request to `service` whose path has no fault; `charset` is
+  /// for every message.
+  RequestHandler(const TokenService &service, const EchoService &echo, const Fault &fault, const Charset &charset)
+      : m_service(service), m_echo(echo), m_fault(fault), m_charset(charset) {}
 
   Delivery Handle(const HttpRequest &request) const noexcept;
 
 private:
   Delivery Answer(const HttpRequest &request) const;
+  Delivery AnswerRequest(const HttpRequest &request, const Fault &fault) const;
+  Delivery AnswerEcho(const HttpRequest &request) const;
+  Delivery AnswerWith(const HttpRequest &request, const SoapAnswer &answer, std::string_view mediaType,
+                      const Fault &fault) const;
   /// The fault in a path below /sts/fault/; none for an unknown name.
   std::optional<Fault> FaultOf(std::string_view path) const;
   /// Whether this is the first request to that path, which contains /once/.
   bool IsFirst(std::string_view onceOnly) const;
 
   const TokenService &m_service;
+  const EchoService &m_echo;
   const Fault m_fault;
   const Charset m_charset;
   mutable std::mutex m_mutex;

@@ -5,15 +5,17 @@
 #include "base64.h"
 
 #include <new>
+#include <string_view>
+#include <utility>
 
 namespace DevSts {
 
 namespace {
 
 /// An envelope with an empty body.
-Document NewEnvelope() {
-  Document document = NewDocument(Ns::SOAPENV, "Envelope");
-  AddElement(*xmlDocGetRootElement(document.get()), Ns::SOAPENV, "Body");
+Document NewEnvelope(const Namespace &soap = Ns::SOAPENV) {
+  Document document = NewDocument(soap, "Envelope");
+  AddElement(*xmlDocGetRootElement(document.get()), soap, "Body");
   return document;
 }
 
@@ -41,6 +43,33 @@ void AddLeg(xmlNode &response, const std::string &context, const std::vector<uns
   xmlNode &exchange = AddElement(response, Ns::WST, "BinaryExchange", EncodeBase64(leg));
   SetAttribute(exchange, "EncodingType", BASE64_ENCODING);
   SetAttribute(exchange, "ValueType", SPNEGO_VALUE_TYPE);
+}
+
+bool IsOfSoap(const FaultCode &code) {
+  return std::string_view(code.ns.uri) == Ns::SOAPENV.uri;
+}
+
+/// The code of SOAP 1.2 for a code of SOAP 1.1, or of another standard.
+const char *Soap12Code(const FaultCode &code) {
+  const std::string name = IsOfSoap(code) ? code.name : "";
+  if (name == Code::MUST_UNDERSTAND.name) {
+    return Code::MUST_UNDERSTAND.name;
+  }
+  return name == Code::SERVER.name ? "Receiver" : "Sender";
+}
+
+Document Soap12FaultResponse(const FaultCode &code, const std::string &reason) {
+  Document document = NewEnvelope(Ns::SOAP12);
+  xmlNode &fault = AddElement(BodyOf(*document), Ns::SOAP12, "Fault");
+  xmlNode &outer = AddElement(fault, Ns::SOAP12, "Code");
+  AddElement(outer, Ns::SOAP12, "Value", std::string(Ns::SOAP12.prefix) + ":" + Soap12Code(code));
+  if (!IsOfSoap(code)) {
+    xmlNode &subcode = AddElement(outer, Ns::SOAP12, "Subcode");
+    DeclareNamespace(AddElement(subcode, Ns::SOAP12, "Value", std::string(code.ns.prefix) + ":" + code.name), code.ns);
+  }
+  xmlNode &text = AddElement(AddElement(fault, Ns::SOAP12, "Reason"), Ns::SOAP12, "Text", reason);
+  xmlNodeSetLang(&text, XmlText("en"));
+  return document;
 }
 
 } // namespace
@@ -96,6 +125,25 @@ Document FaultResponse(const FaultCode *code, const std::string &reason) {
   }
   add("faultstring", reason);
   return document;
+}
+
+bool IsFaultOfSender(const FaultCode &code) {
+  return !IsOfSoap(code) || code.name == std::string(Code::CLIENT.name);
+}
+
+Document VersionedFaultResponse(const SoapVersion &version, const FaultCode &code, const std::string &reason) {
+  return version == SOAP_1_2 ? Soap12FaultResponse(code, reason) : FaultResponse(&code, reason);
+}
+
+Document EchoResponse(ProvenMessage message) {
+  SetText(*message.header, {}); // removes the header blocks
+  xmlFreePropList(message.body->properties);
+  message.body->properties = nullptr;
+  xmlNode &proven = AddElement(*message.header, Ns::ECHO, "Proven");
+  AddElement(proven, Ns::ECHO, "Subject", message.token.subject);
+  AddElement(proven, Ns::ECHO, "Token", message.tokenId);
+  AddElement(proven, Ns::ECHO, "Proof", ProofName(message.proof));
+  return std::move(message.document);
 }
 
 } // namespace DevSts

@@ -4,7 +4,9 @@
 
 #pragma once
 
+#include "proven_message.h"
 #include "refusal.h"
+#include "soap_version.h"
 #include "xml_tree.h"
 
 #include <string>
@@ -30,5 +32,14 @@ Document ValidateResponse(bool isValid);
 
 /// A SOAP fault. If `code` is null, the fault has no faultcode element.
 Document FaultResponse(const FaultCode *code, const std::string &reason);
+
+/// Whether the fault says that the message, and not the service, is the cause.
+bool IsFaultOfSender(const FaultCode &code);
+
+/// A fault of that version of SOAP. In SOAP 1.2, a code that is not SOAP's own is the subcode.
+Document VersionedFaultResponse(const SoapVersion &version, const FaultCode &code, const std::string &reason);
+
+/// The message itself, with one header block that states whose token it has and what its sender proved.
+Document EchoResponse(ProvenMessage message);
 
 } // namespace DevSts

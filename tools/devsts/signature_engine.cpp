@@ -163,9 +163,22 @@ std::vector<SignatureReference> ReadReferences(const xmlNode &signature) {
   return references;
 }
 
-bool VerifiesWith(xmlNode &signature, const SignatureKey &key) {
+std::optional<std::vector<unsigned char>> VerifiedSignedInfo(xmlNode &signature, const SignatureKey &key) {
   const Context context = NewContext(key);
-  return xmlSecDSigCtxVerify(context.get(), &signature) >= 0 && context->status == xmlSecDSigStatusSucceeded;
+  context->flags |= XMLSEC_DSIG_FLAGS_STORE_SIGNATURE;
+  if (xmlSecDSigCtxVerify(context.get(), &signature) < 0 || context->status != xmlSecDSigStatusSucceeded) {
+    return std::nullopt;
+  }
+  xmlSecBuffer *const octets = xmlSecDSigCtxGetPreSignBuffer(context.get());
+  if (!octets) {
+    throw std::runtime_error("libxmlsec1 does not keep what it verifies");
+  }
+  const unsigned char *const begin = xmlSecBufferGetData(octets);
+  return std::vector<unsigned char>(begin, begin + xmlSecBufferGetSize(octets));
+}
+
+bool VerifiesWith(xmlNode &signature, const SignatureKey &key) {
+  return VerifiedSignedInfo(signature, key).has_value();
 }
 
 void SignEnveloped(xmlNode &element, const std::string &id, xmlNode &sibling, const SignatureKey &key) {

@@ -12,6 +12,7 @@
 #include <xmlsec/keys.h>
 
 #include <memory>
+#include <optional>
 #include <string>
 #include <vector>
 
@@ -49,8 +50,12 @@ struct SignatureReference {
 /// preceded by "enveloped".
 std::vector<SignatureReference> ReadReferences(const xmlNode &signature);
 
-/// Whether the signature's value, checked with `key` whatever `KeyInfo` says, and all digests are right. Call it after
-/// `RegisterIdentifiers` for the document and a successful `ReadReferences`.
+/// The canonical form of `ds:SignedInfo`, if the signature's value, checked with `key` for every `KeyInfo`, and all
+/// digests are right; otherwise none. Call it after `RegisterIdentifiers` for the document and a successful
+/// `ReadReferences`.
+std::optional<std::vector<unsigned char>> VerifiedSignedInfo(xmlNode &signature, const SignatureKey &key);
+
+/// Whether the signature verifies, under the same conditions.
 bool VerifiesWith(xmlNode &signature, const SignatureKey &key);
 
 /// Signs the whole `element`, whose identifier is `id`, with an enveloped signature after its child `sibling`.

@@ -71,6 +71,13 @@ void Node::AppendNode(Node *child) noexcept {
   m_lastChild = child;
 }
 
+void Node::PrependNode(Node *child) noexcept {
+  child->m_parent = this;
+  child->m_nextSibling = m_firstChild;
+  m_firstChild = child;
+  m_lastChild = m_lastChild ? m_lastChild : child;
+}
+
 void Node::RemoveNode(Node *child) noexcept {
   Node *previous = nullptr;
   for (Node *node = m_firstChild; node != child; node = node->m_nextSibling) {
@@ -207,6 +214,24 @@ void ElementNode::DefineAttribute(std::string_view qualifiedName, std::string_vi
   AppendAttribute(end, name, hasPrefix ? colon : 0, m_arena->Copy(value));
 }
 
+bool ElementNode::RemoveAttribute(std::string_view qualifiedName) noexcept {
+  Attribute **nextDeclaration = &m_firstDeclaration;
+  for (Attribute **next = &m_firstAttribute; *next; next = &(*next)->m_next) {
+    Attribute &attribute = **next;
+    if (attribute.m_name == qualifiedName) {
+      if (attribute.m_isNamespaceDeclaration) {
+        *nextDeclaration = attribute.m_nextDeclaration;
+      }
+      *next = attribute.m_next;
+      return true;
+    }
+    if (attribute.m_isNamespaceDeclaration) {
+      nextDeclaration = &attribute.m_nextDeclaration;
+    }
+  }
+  return false;
+}
+
 ElementNode *ElementNode::AppendElement(std::string_view prefix, std::string_view localName) {
   RequireElementName(prefix, localName);
   ElementNode *const child = m_arena->New<ElementNode>(m_arena);
@@ -243,7 +268,7 @@ void ElementNode::AppendAttribute(AttributeEnd &end, std::string_view name, std:
   }
 }
 
-void ElementNode::AppendChild(Node *child) {
+void ElementNode::TakeFromDocument(Node *child) {
   if (!child || child->GetKind() == NodeKind::DOCUMENT) {
     throw InvalidArgumentException(child ? "a document cannot be a child" : "the child is null");
   }
@@ -261,8 +286,26 @@ void ElementNode::AppendChild(Node *child) {
   if (child->m_parent) {
     child->m_parent->RemoveNode(child);
   }
+}
+
+void ElementNode::AppendChild(Node *child) {
+  TakeFromDocument(child);
   AppendNode(child);
   NodeArena::Join(m_arena, child->m_arena);
+}
+
+void ElementNode::PrependChild(Node *child) {
+  TakeFromDocument(child);
+  PrependNode(child);
+  NodeArena::Join(m_arena, child->m_arena);
+}
+
+bool ElementNode::RemoveChild(Node *child) noexcept {
+  const bool isChild = child && child->m_parent == this;
+  if (isChild) {
+    RemoveNode(child);
+  }
+  return isChild;
 }
 
 void CreateElementNode(std::string_view prefix, std::string_view localName, Ref<ElementNode> &out) {

@@ -83,13 +83,14 @@ TEST(Process, ReadyLineHasTheAddressAndTheFiles) {
   const Testing::JsonObject ready = Testing::ReadJsonObject(service.GetReadyLine());
   EXPECT_EQ(ready.numbers.at("schema"), 1);
   EXPECT_EQ(ready.texts.at("url"), "https://localhost:" + std::to_string(service.GetPort()) + "/sts");
+  EXPECT_EQ(ready.texts.at("echo"), "https://localhost:" + std::to_string(service.GetPort()) + "/echo");
   EXPECT_EQ(ready.numbers.at("port"), service.GetPort());
   EXPECT_EQ(ready.numbers.at("pid"), service.GetProcess());
   EXPECT_EQ(ready.texts.at("ca"), service.PathOf("authority.crt"));
   EXPECT_EQ(ready.texts.at("trust"), service.PathOf("signing.crt"));
   EXPECT_THAT(ready.texts.at("thumbprint"), testing::MatchesRegex("[0-9a-f]{64}"));
   EXPECT_TRUE(fs::path(ready.texts.at("ca")).is_absolute());
-  EXPECT_EQ(ready.texts.size() + ready.numbers.size(), 7U);
+  EXPECT_EQ(ready.texts.size() + ready.numbers.size(), 8U);
 }
 
 TEST(Process, ListensOnBothLoopbackAddresses) {

@@ -99,6 +99,21 @@ bool RawConnection::IsEnded() {
 TlsClient::TlsClient(const Testing::DevSts &service, bool v6)
     : m_context(NewContext(service), SSL_CTX_free), m_connection(service, v6),
       m_tls(SSL_new(m_context.get()), SSL_free) {
+  Connect();
+}
+
+TlsClient::TlsClient(const Testing::DevSts &service, const std::string &identity)
+    : m_context(NewContext(service), SSL_CTX_free), m_connection(service, false),
+      m_tls(SSL_new(m_context.get()), SSL_free) {
+  const std::string certificate = service.PathOf(identity + ".crt");
+  const std::string key = service.PathOf(identity + ".key");
+  Require(SSL_use_certificate_file(m_tls.get(), certificate.c_str(), SSL_FILETYPE_PEM) == 1 &&
+              SSL_use_PrivateKey_file(m_tls.get(), key.c_str(), SSL_FILETYPE_PEM) == 1,
+          "no identity");
+  Connect();
+}
+
+void TlsClient::Connect() {
   std::signal(SIGPIPE, SIG_IGN); // OpenSSL may write to a connection that the service has reset
   ERR_clear_error();
   Require(SSL_set_fd(m_tls.get(), m_connection.GetDescriptor()) == 1 && SSL_set1_host(m_tls.get(), "localhost") == 1 &&
@@ -158,9 +173,9 @@ std::string PostBytes(std::string_view action, std::string_view message, std::st
 }
 
 HttpAnswer Post(const Testing::DevSts &service, std::string_view action, std::string_view message,
-                std::string_view target) {
+                std::string_view target, std::string_view contentType) {
   TlsClient client(service);
-  client.Send(PostBytes(action, message, target));
+  client.Send(PostBytes(action, message, target, contentType));
   return client.Receive();
 }
 

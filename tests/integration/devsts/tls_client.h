@@ -45,6 +45,8 @@ private:
 class TlsClient {
 public:
   explicit TlsClient(const Testing::DevSts &service, bool v6 = false);
+  /// Has the certificate and the key of this identity in the service's state folder, for a service that asks for one.
+  TlsClient(const Testing::DevSts &service, const std::string &identity);
   TlsClient(const TlsClient &) = delete;
   TlsClient &operator=(const TlsClient &) = delete;
 
@@ -58,6 +60,7 @@ public:
 
 private:
   bool ReadSome();
+  void Connect();
 
   std::unique_ptr<ssl_ctx_st, void (*)(ssl_ctx_st *)> m_context;
   RawConnection m_connection;
@@ -71,6 +74,6 @@ std::string PostBytes(std::string_view action, std::string_view message, std::st
 
 /// Sends the request on a connection of its own.
 HttpAnswer Post(const Testing::DevSts &service, std::string_view action, std::string_view message,
-                std::string_view target = "/sts");
+                std::string_view target = "/sts", std::string_view contentType = "text/xml");
 
 } // namespace DevStsTest

@@ -69,6 +69,7 @@ protected:
   ~Node() = default;
 
   void AppendNode(Node *child) noexcept;
+  void PrependNode(Node *child) noexcept;
   void RemoveNode(Node *child) noexcept;
 
   NodeArena *m_arena;
@@ -218,13 +219,21 @@ public:
   ///         contains a character that XML 1.0 cannot carry.
   void DefineAttribute(std::string_view qualifiedName, std::string_view value);
 
+  /// Removes the attribute, or the namespace declaration, of that name as written.
+  /// @return whether there was one.
+  bool RemoveAttribute(std::string_view qualifiedName) noexcept;
+
   /// Makes `child` the last child. The child of a document, such as its document element, is removed from the document.
   /// @throws InvalidArgumentException when `child` is null, a document, the element itself or its ancestor.
   /// @throws InvalidStateException when `child` already is the child of an element.
   void AppendChild(Node *child);
 
-  /// Makes `child` the first child, by the rules of `AppendChild`.
+  /// Makes `child` the first child, by the rules of `AppendChild`, and with its exceptions.
   void PrependChild(Node *child);
+
+  /// Removes `child` from the children. It stays valid as long as its tree, and can be added to an element again.
+  /// @return whether it was a child of this element; otherwise nothing changes.
+  bool RemoveChild(Node *child) noexcept;
 
   /// Makes a new element the last child. It is made in the memory of this element's tree, so that it costs no allocation of
   /// its own, and lives as long as the tree.
@@ -253,6 +262,9 @@ private:
   // The views passed to both functions must be valid as long as the arena.
   void SetName(std::string_view name) noexcept;
   void AppendAttribute(AttributeEnd &end, std::string_view name, std::size_t prefixLength, std::string_view value);
+
+  /// Checks that `child` may become a child of this element, and removes it from its document.
+  void TakeFromDocument(Node *child);
 
   std::uint32_t m_prefixLength = 0;
   std::string_view m_name;
