@@ -38,6 +38,25 @@ std::string ReportValue(std::string_view text) {
 
 } // namespace
 
+TokenReport::Finding MakeFinding(const Deviation &deviation, ElementPaths &paths, std::uint32_t line,
+                                 std::uint32_t column) {
+  TokenReport::Finding finding;
+  finding.message = ReportText(deviation.message);
+  finding.attribute = ReportText(deviation.attribute);
+  finding.line = line;
+  finding.column = column;
+  if (deviation.element) {
+    finding.element = ReportText(deviation.element->GetName());
+    finding.path = ReportText(paths.Of(*deviation.element));
+    finding.line = deviation.element->GetLine();
+    finding.column = deviation.element->GetColumn();
+  }
+  finding.wanted = ReportValue(deviation.allowed);
+  finding.found = ReportValue(deviation.found);
+  finding.missedBySec = deviation.missedBySec;
+  return finding;
+}
+
 ReportRecorder::ReportRecorder(TokenReport &report) : m_report(report) {
   m_report.checks.resize(CHECKS);
   for (std::size_t index = 0; index < CHECKS; ++index) {
@@ -89,20 +108,7 @@ void ReportRecorder::AddAt(const Deviation &deviation, std::uint32_t line, std::
     m_report.refusal = deviation.message;
   }
   m_current->outcome = Outcome::FAILED;
-  TokenReport::Finding finding;
-  finding.message = ReportText(deviation.message);
-  finding.attribute = ReportText(deviation.attribute);
-  finding.line = line;
-  finding.column = column;
-  if (deviation.element) {
-    finding.element = ReportText(deviation.element->GetName());
-    finding.path = ReportText(m_paths.Of(*deviation.element));
-    finding.line = deviation.element->GetLine();
-    finding.column = deviation.element->GetColumn();
-  }
-  finding.wanted = ReportValue(deviation.allowed);
-  finding.found = ReportValue(deviation.found);
-  finding.missedBySec = deviation.missedBySec;
+  TokenReport::Finding finding = MakeFinding(deviation, m_paths, line, column);
   finding.remedy = ReportText(RemedyFor(m_report, m_current->check, finding));
   m_current->findings.push_back(std::move(finding));
   ++m_listed;

@@ -19,6 +19,12 @@ namespace SsoClient {
 /// `text` as reports contain it: printable and shortened.
 std::string ReportText(std::string_view text);
 
+/// `deviation` as a finding without a remedy.
+/// @param paths of the tree in which the deviation is
+/// @param line, column used if `deviation` has no element
+TokenReport::Finding MakeFinding(const Deviation &deviation, ElementPaths &paths, std::uint32_t line,
+                                 std::uint32_t column);
+
 /// Records the checks of a verification one after the other. The report must outlive the recorder, and the tree must not be
 /// changed.
 class ReportRecorder final : public DeviationSink {

@@ -2,8 +2,9 @@
 
 #include <ssoclient/token_report.h>
 
+#include "token/report_text.h"
+
 #include <tarvel/core/exception.h>
-#include <tarvel/core/string_util.h>
 
 #include <algorithm>
 
@@ -13,56 +14,7 @@ namespace {
 
 using Check = TokenReport::Check;
 using CheckResult = TokenReport::CheckResult;
-using Finding = TokenReport::Finding;
 using Outcome = TokenReport::Outcome;
-
-void AppendColumn(std::string &text, const std::string &word, std::size_t width) {
-  text += word;
-  text.append(width > word.size() ? width - word.size() : 0, ' ');
-  text += "  ";
-}
-
-void AppendPart(std::string &text, const char *name, const std::string &value) {
-  if (!value.empty()) {
-    text.append("\n      ").append(name).append(": ").append(value);
-  }
-}
-
-std::string PlaceOf(const Finding &finding) {
-  std::string place = finding.path;
-  if (!finding.attribute.empty()) {
-    place.append("/@").append(finding.attribute);
-  }
-  if (finding.line != 0) {
-    place += place.empty() ? "" : ", ";
-    place += "line " + std::to_string(finding.line) + ", column " + std::to_string(finding.column);
-  }
-  return place;
-}
-
-void AppendFinding(std::string &text, const Finding &finding) {
-  text.append("    ").append(finding.message);
-  AppendPart(text, "at", PlaceOf(finding));
-  AppendPart(text, "wanted", finding.wanted);
-  AppendPart(text, "found", finding.found);
-  AppendPart(text, "missed by", finding.missedBySec ? std::to_string(finding.missedBySec) + " s" : std::string());
-  AppendPart(text, "what to do", finding.remedy);
-  text += "\n";
-}
-
-void AppendCheck(std::string &text, const CheckResult &result) {
-  constexpr std::size_t CHECK_WIDTH = 21; // of "required-confirmation"
-  constexpr std::size_t OUTCOME_WIDTH = 8;
-  AppendColumn(text, GetCheckName(result.check), CHECK_WIDTH);
-  AppendColumn(text, GetOutcomeName(result.outcome), OUTCOME_WIDTH);
-  text.append(result.summary).append("\n");
-  for (const Finding &finding : result.findings) {
-    AppendFinding(text, finding);
-  }
-  if (result.unlistedFindings != 0) {
-    text.append("    and ").append(std::to_string(result.unlistedFindings)).append(" more\n");
-  }
-}
 
 } // namespace
 
@@ -129,14 +81,7 @@ const char *GetOutcomeName(Outcome outcome) noexcept {
 }
 
 std::string WriteTokenReport(const TokenReport &report) {
-  using Tarvel::StringUtil;
-  std::string text = report.accepted
-                         ? "The token is accepted.\n"
-                         : "The token is refused: " + StringUtil::Shorten(StringUtil::Printable(report.refusal)) + "\n";
-  for (const CheckResult &result : report.checks) {
-    AppendCheck(text, result);
-  }
-  return text;
+  return WriteChecks("The token", report);
 }
 
 } // namespace SsoClient
