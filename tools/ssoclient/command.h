@@ -35,6 +35,8 @@ Action DefineRenew(CLI::App &app, const OutputOptions &output);
 Action DefineValidate(CLI::App &app, const OutputOptions &output);
 Action DefineVerify(CLI::App &app, const OutputOptions &output);
 Action DefineInspect(CLI::App &app, const OutputOptions &output);
+Action DefineSign(CLI::App &app, const OutputOptions &output);
+Action DefineCheckMessage(CLI::App &app, const OutputOptions &output);
 Action DefineDoctor(CLI::App &app, const OutputOptions &output);
 Action DefineDialect(CLI::App &app, const OutputOptions &output);
 

@@ -6,6 +6,7 @@
 
 #include <ssoclient/client/exceptions.h>
 #include <ssoclient/exceptions.h>
+#include <ssoclient/proof/exceptions.h>
 #ifdef SSOCLIENT_TOOL_HAS_GSSAPI
 #include <ssoclient/gssapi/exceptions.h>
 #endif
@@ -31,8 +32,8 @@ constexpr Meaning MEANINGS[] = {
     {ExitCode::USAGE, "wrong command line"},
     {ExitCode::CREDENTIALS_REFUSED, "credentials missing, expired, or refused by the service"},
     {ExitCode::COMMUNICATION, "communication with the service failed"},
-    {ExitCode::TOKEN_INVALID, "token invalid or expired; for validate: the verdict"},
-    {ExitCode::SIGNATURE_INVALID, "signature invalid"},
+    {ExitCode::TOKEN_INVALID, "token or message invalid or expired; for validate: the verdict"},
+    {ExitCode::SIGNATURE_INVALID, "signature or proof invalid"},
     {ExitCode::FILE_OR_KEY, "a file, key, certificate or passphrase"},
     {ExitCode::SERVICE_FAULT, "any other failure that the service reports"},
     {ExitCode::INTERRUPTED, "interrupted"},
@@ -69,6 +70,10 @@ constexpr Row TABLE[] = {
      {ExitCode::SIGNATURE_INVALID, "SignatureSyntaxException", "signature invalid"}},
     {IsA<Tarvel::Xml::Security::XmlSecurityException>,
      {ExitCode::SIGNATURE_INVALID, "XmlSecurityException", "signature invalid"}},
+    {IsA<InvalidProofException>, {ExitCode::SIGNATURE_INVALID, "InvalidProofException", "proof invalid"}},
+    {IsA<StaleMessageException>, {ExitCode::TOKEN_INVALID, "StaleMessageException", "message invalid"}},
+    {IsA<RepeatedMessageException>, {ExitCode::TOKEN_INVALID, "RepeatedMessageException", "message invalid"}},
+    {IsA<InvalidMessageException>, {ExitCode::TOKEN_INVALID, "InvalidMessageException", "message invalid"}},
     {IsA<Tarvel::IOException>, {ExitCode::FILE_OR_KEY, "IOException", "file"}},
     {IsA<Tarvel::Crypto::WrongPassphraseException>, {ExitCode::FILE_OR_KEY, "WrongPassphraseException", "passphrase"}},
     {IsA<Tarvel::Crypto::NoKeyException>, {ExitCode::FILE_OR_KEY, "NoKeyException", "key"}},

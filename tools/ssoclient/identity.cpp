@@ -15,19 +15,15 @@ namespace Crypto = Tarvel::Crypto;
 
 constexpr const char *GROUP = "Identity";
 
-Crypto::PassphraseCallback AskFor(const IdentityOptions &options, const std::string &place) {
-  return [&options, place] { return ReadSecret(options.passphrase, "Passphrase for " + place + ": ").Get(); };
-}
-
 HolderOfKeyConfig LoadStore(const IdentityOptions &options) {
-  const Crypto::KeyStore store = Crypto::LoadKeyStore(options.p12File, AskFor(options, options.p12File));
+  const Crypto::KeyStore store = Crypto::LoadKeyStore(options.p12File, AskForPassphrase(options.passphrase, options.p12File));
   return {store.privateKey, store.certificate};
 }
 
 HolderOfKeyConfig LoadPair(const IdentityOptions &options) {
   // A file with a chain begins with the certificate of the key.
   const auto certificate = Crypto::LoadCertificates(options.certificateFile).front();
-  return {Crypto::LoadPrivateKey(options.key, AskFor(options, options.key)), certificate};
+  return {LoadSigningKey(options), certificate};
 }
 
 } // namespace

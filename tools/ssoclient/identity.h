@@ -5,7 +5,7 @@
 #pragma once
 
 #include "input_descriptor.h"
-#include "secret_input.h"
+#include "signing_key.h"
 
 #include <ssoclient/holder_of_key_config.h>
 
@@ -19,11 +19,8 @@ class App;
 
 namespace SsoClient::Tool {
 
-struct IdentityOptions {
+struct IdentityOptions : SigningKeyOptions {
   std::string certificateFile;
-  std::string key; ///< a file or a key URI
-  std::string p12File;
-  SecretOptions passphrase{"passphrase", {}, -1};
 
   bool IsGiven() const { return !certificateFile.empty() || !p12File.empty(); }
 };

@@ -64,6 +64,18 @@ constexpr Command COMMANDS[] = {
      "  ssoclient inspect token.xml\n"
      "  ssoclient inspect --format json - <token.xml\n",
      Format::TEXT, DefineInspect},
+    {"sign", "Put a token into a SOAP message, and sign the message with the token's key",
+     "  ssoclient sign --token client.xml --key client.key --out signed.xml envelope.xml\n"
+     "  ssoclient sign --token client.xml --key client.key \\\n"
+     "      --part '{http://www.w3.org/2005/08/addressing}To' - <envelope.xml\n"
+     "  ssoclient sign --token alice.xml --trust sts.pem --lifetime 1m envelope.xml\n",
+     Format::XML, DefineSign},
+    {"check-message", "Check a SOAP message as the service that receives it does, and show what its sender proved",
+     "  ssoclient check-message --trust sts.pem signed.xml\n"
+     "  ssoclient check-message --trust sts.pem --explain signed.xml\n"
+     "  ssoclient check-message --trust sts.pem --allow-bearer --accept-audience https://files.corp.example/ \\\n"
+     "      --format json - <signed.xml\n",
+     Format::TEXT, DefineCheckMessage},
     {"doctor", "Find out why a service cannot be used, without sending it any credential",
      "  ssoclient doctor --sts https://sts.corp.example/sts --ca ca.pem --trust sts.pem\n"
      "  ssoclient doctor --sts https://sts.corp.example/sts --ca ca.pem --timeout 5 --format json\n",
@@ -175,7 +187,7 @@ void AddCommonOptions(CLI::App &app, Format format, CommonOptions &options) {
 }
 
 int Run(int argc, char **argv) {
-  CLI::App app("Acquires, renews, validates, verifies and shows SAML 2.0 tokens of a WS-Trust 1.3 token service.",
+  CLI::App app("Acquires, renews, validates, verifies, shows and uses SAML 2.0 tokens of a WS-Trust 1.3 token service.",
                "ssoclient");
   app.set_version_flag("--version", "ssoclient " SSOCLIENT_VERSION);
   app.footer(ExitCodeHelp());

@@ -10,7 +10,6 @@
 #include <nlohmann/json.hpp>
 
 #include <cstdint>
-#include <utility>
 
 namespace SsoClient::Tool {
 namespace {
@@ -29,28 +28,11 @@ Json OrNull(std::int64_t number) {
   return number == 0 ? Json(nullptr) : Json(number);
 }
 
-Json FindingJson(const TokenReport::Finding &finding) {
-  return {{"message", finding.message},
-          {"element", OrNull(finding.element)},
-          {"attribute", OrNull(finding.attribute)},
-          {"path", OrNull(finding.path)},
-          {"line", OrNull(finding.line)},
-          {"column", OrNull(finding.column)},
-          {"wanted", OrNull(finding.wanted)},
-          {"found", OrNull(finding.found)},
-          {"missedBySec", OrNull(finding.missedBySec)},
-          {"remedy", OrNull(finding.remedy)}};
-}
-
 Json CheckJson(const TokenReport::CheckResult &result) {
-  Json findings = Json::array();
-  for (const TokenReport::Finding &finding : result.findings) {
-    findings.push_back(FindingJson(finding));
-  }
   return {{"name", GetCheckName(result.check)},
           {"outcome", GetOutcomeName(result.outcome)},
           {"summary", result.summary},
-          {"findings", std::move(findings)},
+          {"findings", JsonArrayOf(result.findings, FindingJson)},
           {"unlistedFindings", result.unlistedFindings}};
 }
 
@@ -91,6 +73,19 @@ Json ClaimsJson(const UnverifiedClaims &claims) {
 }
 
 } // namespace
+
+nlohmann::ordered_json FindingJson(const TokenReport::Finding &finding) {
+  return {{"message", finding.message},
+          {"element", OrNull(finding.element)},
+          {"attribute", OrNull(finding.attribute)},
+          {"path", OrNull(finding.path)},
+          {"line", OrNull(finding.line)},
+          {"column", OrNull(finding.column)},
+          {"wanted", OrNull(finding.wanted)},
+          {"found", OrNull(finding.found)},
+          {"missedBySec", OrNull(finding.missedBySec)},
+          {"remedy", OrNull(finding.remedy)}};
+}
 
 nlohmann::ordered_json ReportJson(const ReportView &view) {
   const TokenReport &report = view.report;

@@ -24,6 +24,9 @@ struct ReportView {
 /// become "not done".
 ReportView WithoutTrust(TokenReport report);
 
+/// One deviation as JSON.
+nlohmann::ordered_json FindingJson(const TokenReport::Finding &finding);
+
 /// The whole report as JSON.
 nlohmann::ordered_json ReportJson(const ReportView &view);
 

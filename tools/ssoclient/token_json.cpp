@@ -104,7 +104,7 @@ Json AllNull(Json facts) {
 
 } // namespace
 
-std::string TokenJson(const TokenView &view) {
+nlohmann::ordered_json TokenJsonObject(const TokenView &view) {
   Json json = {{"schema", 1}, {"verified", view.verified}};
   json.update(view.facts ? FactsJson(*view.facts) : AllNull(FactsJson({})));
   if (view.unmet) {
@@ -116,9 +116,13 @@ std::string TokenJson(const TokenView &view) {
   if (view.report) {
     json["report"] = ReportJson(*view.report);
   }
+  return json;
+}
+
+std::string TokenJson(const TokenView &view) {
   // Everything except ASCII is escaped, so that the text cannot control a terminal. A cut in a report may have split a
   // character.
-  return json.dump(2, ' ', true, Json::error_handler_t::replace);
+  return TokenJsonObject(view).dump(2, ' ', true, Json::error_handler_t::replace);
 }
 
 } // namespace SsoClient::Tool

@@ -14,6 +14,7 @@
 #include <tarvel/system/date_time.h>
 
 #include <boost/optional.hpp>
+#include <nlohmann/json_fwd.hpp>
 
 #include <string>
 #include <string_view>
@@ -44,6 +45,9 @@ TokenView InspectToken(std::string xml, TokenProfile profile = TokenProfile::STR
 
 /// "bearer" or "holder-of-key".
 std::string_view ConfirmationText(SamlToken::ConfirmationType confirmation) noexcept;
+
+/// `view` as a JSON object.
+nlohmann::ordered_json TokenJsonObject(const TokenView &view);
 
 /// `view` as one JSON object in ASCII.
 std::string TokenJson(const TokenView &view);

@@ -3,7 +3,6 @@
 #include "trust.h"
 
 #include "exit_code.h"
-#include "option.h"
 
 #include <ssoclient/exceptions.h>
 #include <ssoclient/token_verifier.h>
@@ -42,10 +41,16 @@ std::string HintFor(const std::string &xml, const Tarvel::Crypto::CertificateLis
 } // namespace
 
 void AddTrustOptions(CLI::App &app, TrustOptions &options) {
-  AddOption(app, "--trust", options.files,
-            "File of the service's certificates whose keys are trusted, PEM or DER; may be repeated")
-      .Required()
-      .TypeName("CERT");
+  AddTrustOption(app, options, "File of the service's certificates whose keys are trusted, PEM or DER; may be repeated")
+      .Required();
+  AddTokenFormOptions(app, options);
+}
+
+Option AddTrustOption(CLI::App &app, TrustOptions &options, const std::string &help) {
+  return AddOption(app, "--trust", options.files, help).TypeName("CERT");
+}
+
+void AddTokenFormOptions(CLI::App &app, TrustOptions &options) {
   AddOption(app, "--tolerance", options.toleranceSec, "By how many seconds this machine's clock may be wrong")
       .ShowDefault()
       .TypeName("S");
@@ -80,7 +85,11 @@ std::string ReadTokenText(const std::string &file) {
 
 std::shared_ptr<const SamlToken> ReadToken(const std::string &file, const Tarvel::Crypto::CertificateList &trusted,
                                            const VerifyOptions &options) {
-  const std::string xml = ReadTokenText(file);
+  return VerifyToken(ReadTokenText(file), trusted, options);
+}
+
+std::shared_ptr<const SamlToken> VerifyToken(const std::string &xml, const Tarvel::Crypto::CertificateList &trusted,
+                                             const VerifyOptions &options) {
   try {
     return TokenVerifier(trusted, options).Verify(xml);
   } catch (const InvalidTokenException &refusal) {

@@ -4,6 +4,7 @@
 
 #pragma once
 
+#include "option.h"
 #include "output.h"
 #include "profile.h"
 
@@ -28,7 +29,14 @@ struct TrustOptions {
   std::string profile;
 };
 
+/// Adds --trust, --tolerance and --profile. --trust is required.
 void AddTrustOptions(CLI::App &app, TrustOptions &options);
+
+/// Adds --trust with this help.
+Option AddTrustOption(CLI::App &app, TrustOptions &options, const std::string &help);
+
+/// Adds --tolerance and --profile.
+void AddTokenFormOptions(CLI::App &app, TrustOptions &options);
 
 /// Tolerance and profile of `options`.
 VerifyOptions VerifyOptionsOf(const TrustOptions &options);
@@ -50,6 +58,11 @@ std::string ReadTokenText(const std::string &file);
 /// @throws HintedException for a token that is refused: the exception of `TokenVerifier::Verify`, with a hint.
 std::shared_ptr<const SamlToken> ReadToken(const std::string &file, const Tarvel::Crypto::CertificateList &trusted,
                                            const VerifyOptions &options);
+
+/// The token `xml`, verified.
+/// @throws HintedException as `ReadToken` does.
+std::shared_ptr<const SamlToken> VerifyToken(const std::string &xml, const Tarvel::Crypto::CertificateList &trusted,
+                                             const VerifyOptions &options);
 
 /// Checks again, with the tolerance of `options`, a token that the library has accepted with
 /// `DEFAULT_CLOCK_TOLERANCE_SEC`; does nothing unless the tolerance is less.

@@ -5,6 +5,7 @@
 #include "expect_result.h"
 #include "help_options.h"
 #include "process.h"
+#include "token_values.h"
 
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
@@ -17,7 +18,7 @@ namespace {
 
 using testing::IsSupersetOf;
 
-const char *const COMMANDS[] = {"acquire", "token", "renew", "validate", "verify", "inspect", "doctor", "dialect"};
+const char *const COMMANDS[] = {"acquire", "token", "renew", "validate", "verify", "inspect", "sign", "check-message", "doctor", "dialect"};
 
 class EmptyValue : public testing::TestWithParam<const char *> {};
 
@@ -36,7 +37,7 @@ TEST_P(EmptyValue, OfEachOptionIsAWrongCommandLine) {
 }
 
 INSTANTIATE_TEST_SUITE_P(Of, EmptyValue, testing::ValuesIn(COMMANDS),
-                         [](const auto &command) { return std::string(command.param); });
+                         [](const auto &command) { return Fill(command.param, "-", "_"); });
 
 TEST(EmptyValue, IsTestedForTheOptionsWithAnArgument) {
   const std::set<std::string> options = OptionsWithArgument("acquire");
@@ -72,7 +73,7 @@ TEST(EmptyValue, IsNotFoundInTheNameOfAFile) {
 }
 
 TEST(EmptyValue, InPlaceOfTheTokenIsAWrongCommandLine) {
-  for (const std::string command : {"renew", "validate", "verify", "inspect"}) {
+  for (const std::string command : {"renew", "validate", "verify", "inspect", "sign", "check-message"}) {
     ExpectResult(RunTool({command, ""}), 2, "", "ssoclient: usage: FILE: must not be empty; see ssoclient --help\n");
   }
 }

@@ -243,7 +243,7 @@ TEST(Tool, ListsItsCommandsAndExitCodesInTheHelp) {
   const Result result = RunTool({"--help"});
   EXPECT_EQ(0, result.exitCode);
   EXPECT_EQ("", result.err);
-  for (const char *command : {"acquire", "token", "renew", "validate", "verify", "inspect", "doctor", "dialect"}) {
+  for (const char *command : {"acquire", "token", "renew", "validate", "verify", "inspect", "sign", "check-message", "doctor", "dialect"}) {
     EXPECT_NE(std::string::npos, result.out.find(std::string("\n  ") + command + " ")) << command;
   }
   EXPECT_NE(std::string::npos, result.out.find(R"(Exit codes:
@@ -252,8 +252,8 @@ TEST(Tool, ListsItsCommandsAndExitCodesInTheHelp) {
   2    wrong command line
   3    credentials missing, expired, or refused by the service
   4    communication with the service failed
-  5    token invalid or expired; for validate: the verdict
-  6    signature invalid
+  5    token or message invalid or expired; for validate: the verdict
+  6    signature or proof invalid
   7    a file, key, certificate or passphrase
   8    any other failure that the service reports
   130  interrupted
