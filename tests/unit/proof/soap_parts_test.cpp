@@ -11,9 +11,9 @@
 namespace SsoClient {
 namespace {
 
-using ::Testing::ParseDocument;
 using Tarvel::Xml::Document;
 using Tarvel::Xml::ElementNode;
+using ::Testing::ParseDocument;
 
 const std::string SOAP11 = "http://schemas.xmlsoap.org/soap/envelope/";
 const std::string SOAP12 = "http://www.w3.org/2003/05/soap-envelope";
@@ -175,9 +175,9 @@ TEST(FindIdentifier, IgnoresOtherNamesAndValuesThatNoReferenceCanContain) {
 }
 
 TEST(IsIdentifier, AcceptsTheNamesThatReferencesCanResolve) {
-  const auto document =
-      ParseDocument("<a xmlns:u=\"" + WSU + "\" xmlns:o=\"urn:other\" Id=\"1\" ID=\"2\" u:Id=\"3\" xml:id=\"4\" "
-                    "id=\"5\" o:Id=\"6\" u:ID=\"7\" xml:Id=\"8\"/>");
+  const auto document = ParseDocument("<a xmlns:u=\"" + WSU +
+                                      "\" xmlns:o=\"urn:other\" Id=\"1\" ID=\"2\" u:Id=\"3\" xml:id=\"4\" "
+                                      "id=\"5\" o:Id=\"6\" u:ID=\"7\" xml:Id=\"8\"/>");
   std::string identifiers;
   const ElementNode &element = *document->GetDocumentElement();
   for (const auto *attribute = element.GetFirstAttribute(); attribute; attribute = attribute->GetNext()) {
