@@ -2,6 +2,7 @@
 
 #include "compose/message_signing.h"
 
+#include "compose/bound_prefix.h"
 #include "compose/wire_names.h"
 #include "model/namespaces.h"
 
@@ -34,14 +35,19 @@ ElementNode *RequireChild(ElementNode *parent, std::string_view namespaceUri, co
   return child;
 }
 
-/// Adds references to the elements of WS-Addressing in the header, in their order.
-void AddAddressingToSignature(Security::Signature &signature, ElementNode *header) {
+/// Adds the identifiers of the elements of WS-Addressing in the header, in their order.
+void AddAddressing(std::vector<std::string> &identifiers, ElementNode *header) {
   for (Node *child = header->GetFirstChild(); child; child = child->GetNextSibling()) {
     ElementNode *const element = AsElement(child);
     if (element && element->HasQName(Namespaces::WSA, element->GetLocalName())) {
-      AddElementToSignature(signature, element);
+      identifiers.push_back(CreateWssuId(element));
     }
   }
+}
+
+void AddReference(Security::Signature &signature, const std::string &identifier) {
+  signature.AddReference("#" + identifier, Security::SignatureUri::DIGEST_SHA256,
+                         Security::CanonicalizationUri::EXCLUSIVE);
 }
 
 } // namespace
@@ -53,24 +59,33 @@ void SignSoapMessage(const Tarvel::Crypto::PrivateKey &privateKey, const XMLBuil
   ElementNode *const security = RequireChild(header, Namespaces::WSSE, "Security");
   ElementNode *const timestamp = FindChild(security, Namespaces::WSU, "Timestamp");
 
-  Tarvel::Ref<Security::Signature> signature;
-  Security::CreateBlankSignature(envelope, Security::CanonicalizationUri::EXCLUSIVE, Security::SignatureUri::RSA_SHA256,
-                                 "ds", signature);
-  AddElementToSignature(*signature, body);
+  std::vector<std::string> identifiers{CreateWssuId(body)};
   if (timestamp) {
-    AddElementToSignature(*signature, timestamp);
+    identifiers.push_back(CreateWssuId(timestamp));
   }
-  AddAddressingToSignature(*signature, header);
+  AddAddressing(identifiers, header);
+  const Tarvel::Ref<ElementNode> signature =
+      SignIdentifiedElements(envelope, identifiers, Security::SignatureUri::RSA_SHA256, keyInfo, privateKey);
+  signature->DefineAttribute("Id", WireNames::HOLDER_OF_KEY_SIGNATURE_ID);
+  security->AppendChild(signature.get());
+}
+
+Tarvel::Ref<ElementNode> SignIdentifiedElements(const Tarvel::Ref<ElementNode> &root,
+                                                const std::vector<std::string> &identifiers,
+                                                std::string_view signatureUri, const XMLBuilderPtr &keyInfo,
+                                                const Tarvel::Crypto::PrivateKey &privateKey) {
+  Tarvel::Ref<Security::Signature> signature;
+  Security::CreateBlankSignature(root, Security::CanonicalizationUri::EXCLUSIVE, signatureUri, "ds", signature);
+  for (const std::string &identifier : identifiers) {
+    AddReference(*signature, identifier);
+  }
   if (keyInfo) {
     Tarvel::Ref<ElementNode> content;
     keyInfo->build(content);
     signature->SetKeyInfo(content);
   }
   signature->Sign(privateKey);
-
-  const Tarvel::Ref<ElementNode> element = signature->GetElement();
-  element->DefineAttribute("Id", WireNames::HOLDER_OF_KEY_SIGNATURE_ID);
-  security->AppendChild(element.get());
+  return signature->GetElement();
 }
 
 std::string CreateWssuId(ElementNode *element) {
@@ -78,14 +93,12 @@ std::string CreateWssuId(ElementNode *element) {
     return std::string(existing->GetValue());
   }
   std::string id = std::string(element->GetLocalName()) + Tarvel::StringUtil::GenerateUuid();
-  element->DefineAttribute("xmlns:wsu", Namespaces::WSU);
-  element->DefineAttribute("wsu:Id", id);
+  element->DefineAttribute(BindPrefix(*element, "wsu", Namespaces::WSU) + ":Id", id);
   return id;
 }
 
 void AddElementToSignature(Security::Signature &signature, ElementNode *element) {
-  signature.AddReference("#" + CreateWssuId(element), Security::SignatureUri::DIGEST_SHA256,
-                         Security::CanonicalizationUri::EXCLUSIVE);
+  AddReference(signature, CreateWssuId(element));
 }
 
 } // namespace SsoClient

@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// The XML signature of an envelope's body, timestamp and header elements of WS-Addressing.
+/// The XML signature of a message: of a request to the token service, or of any elements of an envelope.
 
 #pragma once
 
@@ -12,6 +12,8 @@
 #include <tarvel/xml/security/signature.h>
 
 #include <string>
+#include <string_view>
+#include <vector>
 
 namespace SsoClient {
 
@@ -23,7 +25,20 @@ namespace SsoClient {
 void SignSoapMessage(const Tarvel::Crypto::PrivateKey &privateKey, const XMLBuilderPtr &keyInfo,
                      const Tarvel::Ref<Tarvel::Xml::ElementNode> &envelope);
 
-/// The `wsu:Id` of the element. If it has none, it gets one that consists of its local name and a new UUID.
+/// A signature over the elements of the tree of `root` that have these identifiers, in this order. Returns its element, which
+/// has no parent: add it to the tree.
+/// @param signatureUri the algorithm, which must be for keys like `privateKey`
+/// @param keyInfo builds the content of the signature's `ds:KeyInfo`; null for none
+/// @throws Tarvel::Xml::Security::XmlSecurityException when the key cannot sign, or not exactly one element of the tree has
+///         one of the identifiers. The tree is not changed.
+Tarvel::Ref<Tarvel::Xml::ElementNode> SignIdentifiedElements(const Tarvel::Ref<Tarvel::Xml::ElementNode> &root,
+                                                             const std::vector<std::string> &identifiers,
+                                                             std::string_view signatureUri,
+                                                             const XMLBuilderPtr &keyInfo,
+                                                             const Tarvel::Crypto::PrivateKey &privateKey);
+
+/// The `wsu:Id` of the element. If it has none, it gets one that consists of its local name and a new UUID. The attribute, and
+/// the declaration of its prefix where it needs one, are the last attributes of the element.
 std::string CreateWssuId(Tarvel::Xml::ElementNode *element);
 
 /// Adds a reference to `element`, by its `wsu:Id`, to the signature.

@@ -8,7 +8,6 @@
 #include "xml/xml_text.h"
 
 #include <tarvel/core/string_util.h>
-#include <tarvel/system/date_time.h>
 #include <tarvel/xml/document.h>
 
 namespace SsoClient {
@@ -33,10 +32,13 @@ XMLCompositePtr WsSecurityHeaderBuilder(int minutes) {
 
 XMLCompositePtr WssuTimestampBuilder(int minutes) {
   const Tarvel::System::DateTime now = Tarvel::System::GetUtcDateTime();
-  const Tarvel::System::DateTime expires = AddMinutesToDate(now, minutes);
+  return WssuTimestampBuilder(now, AddMinutesToDate(now, minutes));
+}
+
+XMLCompositePtr WssuTimestampBuilder(const Tarvel::System::DateTime &created, const Tarvel::System::DateTime &expires) {
   auto timestamp = std::make_shared<XMLCompositeBuilder>(
       ElementBuilder("wsu", "Timestamp", {{"xmlns:wsu", std::string(Namespaces::WSU)}}));
-  timestamp->Add(TextElementBuilder("wsu", "Created", DateTimeFormatter(now)))
+  timestamp->Add(TextElementBuilder("wsu", "Created", DateTimeFormatter(created)))
       .Add(TextElementBuilder("wsu", "Expires", DateTimeFormatter(expires)));
   return timestamp;
 }

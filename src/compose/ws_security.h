@@ -9,6 +9,7 @@
 #include <ssoclient/saml_token.h>
 #include <ssoclient/service_dialect.h>
 #include <tarvel/crypto/certificate.h>
+#include <tarvel/system/date_time.h>
 
 #include <string>
 
@@ -19,6 +20,9 @@ XMLCompositePtr WsSecurityHeaderBuilder(int minutes);
 
 /// `wsu:Timestamp` from now to `minutes` later. The clock is read once.
 XMLCompositePtr WssuTimestampBuilder(int minutes);
+
+/// `wsu:Timestamp` with these two instants.
+XMLCompositePtr WssuTimestampBuilder(const Tarvel::System::DateTime &created, const Tarvel::System::DateTime &expires);
 
 /// `wsse:UsernameToken` without or with a password. The password is in clear text: the connection must keep it secret.
 XMLCompositePtr WsseUsernameTokenBuilder(const std::string &user);

@@ -212,7 +212,7 @@ TEST_P(OurSignature, VerifiesWithXmlSecUnlessSomethingIsChanged) {
       Tarvel::Crypto::LoadCertificates(KEYS + GetParam().key + ".crt"));
   const Verifier verify = [&theirKey](xmlDoc &document) { return Testing::VerifiesWithXmlSec(document, *theirKey); };
   Tally tally;
-  for (std::size_t count = 0; count < DOCUMENTS; count += CHANGES) {
+  for (std::size_t count = 0; count < GetParam().documents; count += CHANGES) {
     const Testing::GeneratedDocument generated = Testing::GenerateDocument(random);
     const Ref<Document> document = Parse(generated.text);
     const Ref<ElementNode> root(document->GetDocumentElement());
@@ -238,14 +238,18 @@ TEST_P(OurSignature, VerifiesWithXmlSecUnlessSomethingIsChanged) {
       ASSERT_NO_FATAL_FAILURE(Compare(text, verify, *resolver, tally));
     }
   }
-  EXPECT_GT(tally.genuine, DOCUMENTS / 8);
-  EXPECT_GT(tally.refused, DOCUMENTS / 8);
+  EXPECT_GT(tally.genuine, GetParam().documents / 8);
+  EXPECT_GT(tally.refused, GetParam().documents / 8);
 }
 
-INSTANTIATE_TEST_SUITE_P(All, OurSignature,
-                         ::testing::Values(SignedBy{"RsaSha256", Uri::RSA_SHA256, "sts-rsa", 31},
-                                           SignedBy{"RsaSha384", Uri::RSA_SHA384, "sts-rsa", 32},
-                                           SignedBy{"RsaSha512", Uri::RSA_SHA512, "sts-rsa", 33}),
-                         NameOf);
+INSTANTIATE_TEST_SUITE_P(
+    All, OurSignature,
+    ::testing::Values(SignedBy{"RsaSha256", Uri::RSA_SHA256, "sts-rsa", 31},
+                      SignedBy{"RsaSha384", Uri::RSA_SHA384, "sts-rsa", 32},
+                      SignedBy{"RsaSha512", Uri::RSA_SHA512, "sts-rsa", 33},
+                      SignedBy{"EcdsaP256Sha256", Uri::ECDSA_SHA256, "sts-ec256", 34},
+                      SignedBy{"EcdsaP384Sha384", Uri::ECDSA_SHA384, "sts-ec384", 35, DOCUMENTS / 10},
+                      SignedBy{"EcdsaP521Sha512", Uri::ECDSA_SHA512, "sts-ec521", 36, DOCUMENTS / 10}),
+    NameOf);
 
 } // namespace

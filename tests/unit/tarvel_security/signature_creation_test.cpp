@@ -71,6 +71,20 @@ TEST(Sign, MakesASignatureThatVerifiesAfterWritingAndParsing) {
   }
 }
 
+TEST(Sign, MakesEcdsaSignaturesOnEachCurve) {
+  for (const std::string key : {"sts-ec256", "sts-ec384", "sts-ec521"}) {
+    for (const std::string_view algorithm : {Uri::ECDSA_SHA256, Uri::ECDSA_SHA384, Uri::ECDSA_SHA512}) {
+      const Ref<Document> document = ParseDocument(MESSAGE);
+      const Ref<Signature> signature = BlankSignatureOf(*document, algorithm);
+      signature->AddReference("#b", Uri::DIGEST_SHA256, EXCLUSIVE);
+      signature->Sign(*Key(key));
+      document->GetDocumentElement()->AppendChild(signature->GetElement().get());
+      EXPECT_TRUE(VerifyText(Serialise(*document), {key})) << key << " " << algorithm;
+      EXPECT_FALSE(VerifyText(Replaced(Serialise(*document), "two", "Two"), {key}));
+    }
+  }
+}
+
 TEST(Sign, WorksWithAnyPrefixAndWithoutOne) {
   EXPECT_TRUE(VerifyText(SignedMessage(Uri::RSA_SHA256, Uri::DIGEST_SHA256, "")));
   EXPECT_TRUE(VerifyText(SignedMessage(Uri::RSA_SHA256, Uri::DIGEST_SHA256, "e")));
@@ -133,9 +147,10 @@ TEST(CreateBlankSignature, RefusesAlgorithmsThatAreNotSupported) {
   const Ref<Document> document = ParseDocument(MESSAGE);
   const Ref<ElementNode> root(document->GetDocumentElement());
   Ref<Signature> signature;
-  EXPECT_THROWS_MESSAGE(
-      CreateBlankSignature(root, EXCLUSIVE, Uri::ECDSA_SHA256, "ds", signature), XmlSecurityException,
-      "Signing with the signature algorithm \"http://www.w3.org/2001/04/xmldsig-more#ecdsa-sha256\" is not supported");
+  EXPECT_THROWS_MESSAGE(CreateBlankSignature(root, EXCLUSIVE, Uri::RSA_PSS_SHA256, "ds", signature),
+                        XmlSecurityException,
+                        "Signing with the signature algorithm "
+                        "\"http://www.w3.org/2007/05/xmldsig-more#sha256-rsa-MGF1\" is not supported");
   EXPECT_THROWS_MESSAGE(
       CreateBlankSignature(root, EXCLUSIVE, "http://www.w3.org/2000/09/xmldsig#rsa-sha1", "ds", signature),
       XmlSecurityException,

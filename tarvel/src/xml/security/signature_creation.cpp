@@ -30,7 +30,7 @@ void RequireExclusive(std::string_view canonicalizationUri) {
 
 SignatureAlgorithm RequireSigningAlgorithm(std::string_view uri) {
   const std::optional<SignatureAlgorithm> algorithm = FindSignatureAlgorithm(uri);
-  if (!algorithm || algorithm->scheme != Crypto::SignatureScheme::RSA_PKCS1) {
+  if (!algorithm || algorithm->scheme == Crypto::SignatureScheme::RSA_PSS) {
     RefuseAlgorithm("signature", uri);
   }
   return *algorithm;

@@ -127,7 +127,8 @@ TARVEL_API void CreateSignatureFromDom(const ElementNode &root, const ElementNod
 
 /// A blank signature, for signing. Its references resolve in the tree of `root`. Its elements have the prefix `prefix`, which
 /// the signature element declares.
-/// @throws XmlSecurityException for algorithms other than exclusive canonicalisation and RSA-SHA256/384/512.
+/// @throws XmlSecurityException for algorithms other than exclusive canonicalisation, and RSA (PKCS#1 v1.5) or ECDSA with
+///         SHA-256/384/512.
 TARVEL_API void CreateBlankSignature(const Ref<ElementNode> &root, std::string_view canonicalizationUri,
                                      std::string_view signatureUri, std::string_view prefix, Ref<Signature> &out);
 
