@@ -11,6 +11,7 @@
 #include "xml/refuse.h"
 
 #include <tarvel/core/string_util.h>
+#include <tarvel/xml/security/exceptions.h>
 
 #include <string>
 
@@ -152,6 +153,15 @@ void FindToken(const MessageRules &rules, CheckedMessage &message) {
   }
 }
 
+void VerifyToken(const TokenVerifier &tokens, const MessageRules &rules, CheckedMessage &message) {
+  try {
+    message.token = tokens.Verify(*message.assertion);
+  } catch (const Tarvel::Xml::Security::XmlSecurityException &error) {
+    Refuse(rules.sinks.form, *message.assertion, "an element with a canonical form", "",
+           "The token of the message is not accepted: %1", error.what());
+  }
+}
+
 void CheckProof(const Tarvel::Xml::Document &document, const MessageRules &rules, CheckedMessage &message) {
   message.key = GetConfirmationKey(*message.token);
   const ElementNode *const signature =
@@ -180,6 +190,9 @@ void CheckParts(const MessageRules &rules, const CheckedMessage &message) {
   }
   if (message.timestamp.element) {
     RequireCovered(*message.timestamp.element, "timestamp", message, sink);
+  }
+  if (rules.options.requireTokenCovered && message.assertion) {
+    RequireCovered(*message.assertion, "token", message, sink);
   }
   for (const MessagePart &part : rules.options.requiredParts) {
     CheckPart(part, message, sink);

@@ -14,6 +14,7 @@
 #include <ssoclient/proof/message_verifier.h>
 #include <ssoclient/proof/proof_kind.h>
 #include <ssoclient/saml_token.h>
+#include <ssoclient/token_verifier.h>
 #include <tarvel/crypto/certificate.h>
 #include <tarvel/crypto/verifying_key.h>
 #include <tarvel/xml/document.h>
@@ -60,8 +61,12 @@ void CheckSecurityHeader(const MessageRules &rules, CheckedMessage &message);
 /// Checks the timestamp of the security header, which must not be null.
 void CheckTimestamp(const MessageRules &rules, CheckedMessage &message);
 
-/// Checks that there is one token in the security header, which must not be null. The caller verifies the token.
+/// Checks that there is one token in the security header, which must not be null.
 void FindToken(const MessageRules &rules, CheckedMessage &message);
+
+/// Verifies the token, which must have been found. It stays null if it has no canonical form.
+/// @throws ParseException and InvalidSignatureException, whatever the sinks are, when the token is refused.
+void VerifyToken(const TokenVerifier &tokens, const MessageRules &rules, CheckedMessage &message);
 
 /// Checks that the sender has proved what the options require, with the token, which must not be null.
 /// @throws Tarvel::TypeMismatchException for a peer certificate that this library has not made, and what OpenSSL's failures

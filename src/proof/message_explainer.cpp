@@ -11,7 +11,6 @@
 #include <tarvel/core/ref.h>
 #include <tarvel/xml/document.h>
 #include <tarvel/xml/parser.h>
-#include <tarvel/xml/security/exceptions.h>
 
 #include <algorithm>
 
@@ -41,7 +40,6 @@ private:
   bool ExplainSecurityHeader();
   void ExplainTimestamp();
   void ExplainToken();
-  void VerifyToken();
   void ExplainProof(const Document &document);
   void ExplainParts();
 
@@ -121,21 +119,13 @@ void MessageExplainer::ExplainToken() {
     return;
   }
   m_report.token = m_tokens.Explain(*m_message.assertion);
-  VerifyToken();
+  try { // a report is not a token, so the token is verified for the checks that need it
+    VerifyToken(m_tokens, m_rules, m_message);
+  } catch (const SsoException &error) {
+    m_recorder.Add({error.what(), m_message.assertion, {}, {}, {}, 0});
+  }
   m_recorder.Summarize(m_recorder.HasFailed() ? "The token is not accepted."
                                               : "There is one token, and it is accepted.");
-}
-
-/// A report is not a token, so the token is verified for the checks that need it.
-void MessageExplainer::VerifyToken() {
-  const auto refuse = [this](const char *text) { m_recorder.Add({text, m_message.assertion, {}, {}, {}, 0}); };
-  try {
-    m_message.token = m_tokens.Verify(*m_message.assertion);
-  } catch (const SsoException &error) {
-    refuse(error.what());
-  } catch (const Tarvel::Xml::Security::XmlSecurityException &error) {
-    refuse(error.what());
-  }
 }
 
 void MessageExplainer::ExplainProof(const Document &document) {

@@ -70,7 +70,7 @@ VerifiedMessage MessageVerifier::State::Verify(const Ref<const Document> &docume
   CheckSecurityHeader(rules, message);
   CheckTimestamp(rules, message);
   FindToken(rules, message);
-  message.token = tokens.Verify(*message.assertion);
+  VerifyToken(tokens, rules, message);
   CheckProof(*document, rules, message);
   CheckParts(rules, message);
 

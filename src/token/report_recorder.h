@@ -19,9 +19,8 @@ namespace SsoClient {
 /// `text` as reports contain it: printable and shortened.
 std::string ReportText(std::string_view text);
 
-/// `deviation` as a finding without a remedy.
+/// `deviation` as a finding without a remedy. `line` and `column` are used if `deviation` has no element.
 /// @param paths of the tree in which the deviation is
-/// @param line, column used if `deviation` has no element
 TokenReport::Finding MakeFinding(const Deviation &deviation, ElementPaths &paths, std::uint32_t line,
                                  std::uint32_t column);
 

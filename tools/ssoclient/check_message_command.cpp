@@ -9,6 +9,8 @@
 #include "option.h"
 #include "trust.h"
 
+#include <ssoclient/exceptions.h>
+#include <ssoclient/proof/exceptions.h>
 #include <ssoclient/proof/message_verifier.h>
 #include <ssoclient/token_verifier.h>
 #include <tarvel/core/exception.h>
@@ -23,6 +25,7 @@ namespace SsoClient::Tool {
 namespace {
 
 constexpr const char *GROUP = "Demands";
+constexpr const char *EXPLAIN_HINT = "ssoclient check-message --explain shows each check of the message";
 constexpr std::int64_t MOST_SECONDS = 24 * 60 * 60;
 
 struct CheckMessageOptions {
@@ -63,6 +66,18 @@ Tarvel::Ref<const Tarvel::Crypto::Certificate> LoadPeer(const CheckMessageOption
   return Tarvel::Crypto::LoadCertificates(options.peerCertificateFile).front();
 }
 
+/// @throws HintedException for a message or a token that is refused
+AcceptedMessage Verify(const MessageVerifier &verifier, const std::string &message,
+                       const Tarvel::Crypto::Certificate *peerCertificate) {
+  try {
+    return ReadAsMessage([&] { return ViewOf(verifier.Verify(message, peerCertificate)); });
+  } catch (const InvalidMessageException &refusal) {
+    throw HintedException(refusal, EXPLAIN_HINT);
+  } catch (const InvalidTokenException &refusal) {
+    throw HintedException(refusal, EXPLAIN_HINT);
+  }
+}
+
 /// Shows the report, and also the message if it is accepted.
 /// @throws the exception that refuses the message, after the report has been written
 ExitCode Explain(const MessageVerifier &verifier, const std::string &message,
@@ -92,10 +107,10 @@ ExitCode CheckMessage(const CheckMessageOptions &options, const OutputOptions &o
   const MessageVerifier verifier(tokens, demands);
   const std::string message = ReadTokenText(options.file);
   if (options.explain) {
-    return Explain(verifier, message, peer.get(), output.format);
+    return ReadAsMessage([&] { return Explain(verifier, message, peer.get(), output.format); });
   }
   MessageView view;
-  view.accepted = ViewOf(verifier.Verify(message, peer.get()));
+  view.accepted = Verify(verifier, message, peer.get());
   WriteOutput(Render(view, output.format));
   return ExitCode::DONE;
 }
@@ -106,8 +121,7 @@ void AddDemands(CLI::App &app, CheckMessageOptions &options) {
       .TypeName("URI")
       .Group(GROUP);
   AddFlag(app, "--allow-bearer", options.acceptsBearer, "Accept a bearer token, which proves nothing").Group(GROUP);
-  AddFlag(app, "--allow-no-timestamp", options.acceptsNoTimestamp, "Accept a message without a timestamp")
-      .Group(GROUP);
+  AddFlag(app, "--allow-no-timestamp", options.acceptsNoTimestamp, "Accept a message without a timestamp").Group(GROUP);
   AddOption(app, "--peer-cert", options.peerCertificateFile,
             "Certificate with which the sender authenticated in TLS, PEM or DER; of a chain, the first")
       .TypeName("FILE")

@@ -105,6 +105,9 @@ Failure Classify(const std::exception &failure) noexcept {
   if (const auto *const hinted = dynamic_cast<const HintedException *>(&failure)) {
     return hinted->GetFailure();
   }
+  if (const auto *const relabelled = dynamic_cast<const RelabelledException *>(&failure)) {
+    return relabelled->GetFailure();
+  }
   for (const Row &row : TABLE) {
     if (row.matches(failure)) {
       return row.failure;

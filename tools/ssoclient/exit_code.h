@@ -57,4 +57,19 @@ private:
   std::string m_hint;
 };
 
+/// A failure that is reported with another label.
+class RelabelledException : public std::runtime_error {
+public:
+  /// @param label outlives the exception
+  RelabelledException(const std::exception &failure, std::string_view label)
+      : std::runtime_error(failure.what()), m_failure(Classify(failure)) {
+    m_failure.label = label;
+  }
+
+  const Failure &GetFailure() const noexcept { return m_failure; }
+
+private:
+  Failure m_failure;
+};
+
 } // namespace SsoClient::Tool

@@ -2,7 +2,6 @@
 
 #include "message_parts.h"
 
-#include "exit_code.h"
 #include "option.h"
 
 namespace SsoClient::Tool {
@@ -42,6 +41,7 @@ void AddMessageArgument(CLI::App &app, std::string &file) {
 
 std::vector<MessagePart> ParseParts(const std::vector<std::string> &texts) {
   std::vector<MessagePart> parts;
+  parts.reserve(texts.size());
   for (const std::string &text : texts) {
     parts.push_back(ParsePart(text));
   }

@@ -4,7 +4,10 @@
 
 #pragma once
 
+#include "exit_code.h"
+
 #include <ssoclient/proof/message_part.h>
+#include <tarvel/xml/parser.h>
 
 #include <boost/optional.hpp>
 
@@ -34,5 +37,16 @@ std::vector<MessagePart> ParseParts(const std::vector<std::string> &texts);
 
 /// The actor; `boost::none` when none is given.
 boost::optional<std::string> ActorOf(const MessagePartsOptions &options);
+
+/// Returns what `call` returns, which reads the text of a message. A text that is not well-formed is an invalid message,
+/// and not an invalid token.
+template <typename Call>
+auto ReadAsMessage(const Call &call) {
+  try {
+    return call();
+  } catch (const Tarvel::Xml::XMLParseException &failure) {
+    throw RelabelledException(failure, "message invalid");
+  }
+}
 
 } // namespace SsoClient::Tool

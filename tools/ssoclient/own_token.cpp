@@ -3,6 +3,7 @@
 #include "own_token.h"
 
 #include "exit_code.h"
+#include "token_view.h"
 
 #include <tarvel/core/checked_cast.h>
 #include <tarvel/core/string_util.h>
@@ -84,11 +85,15 @@ Crypto::CertificateList CertificatesOfSignature(const std::string &xml) {
 std::shared_ptr<const SamlToken> ReadOwnToken(const std::string &file, const TrustOptions &options,
                                               const OutputOptions &output) {
   const std::string xml = ReadTokenText(file);
-  Crypto::CertificateList trusted = LoadTrusted(options, output);
-  if (options.files.empty()) {
-    trusted = CertificatesOfSignature(xml);
+  if (!options.files.empty()) {
+    return VerifyToken(xml, LoadTrusted(options, output), VerifyOptionsOf(options));
   }
-  return VerifyToken(xml, trusted, VerifyOptionsOf(options));
+  const Crypto::CertificateList own = CertificatesOfSignature(xml);
+  if (own.empty()) {
+    InspectToken(xml); // throws when `xml` is not well-formed or has no assertion
+    throw UsageException("the token's signature has no certificate to verify it with; give --trust");
+  }
+  return VerifyToken(xml, own, VerifyOptionsOf(options));
 }
 
 } // namespace SsoClient::Tool

@@ -86,7 +86,8 @@ ExitCode Sign(const SignOptions &options, const OutputOptions &output) {
   CheckCommandLine(options);
   const auto token = ReadOwnToken(options.tokenFile, options.trust, output);
   CheckUse(*token, options);
-  std::string message = Present(ReadTokenText(options.file), *token, options, parts);
+  const std::string given = ReadTokenText(options.file);
+  std::string message = ReadAsMessage([&] { return Present(given, *token, options, parts); });
   if (message.back() != '\n') {
     message += '\n';
   }

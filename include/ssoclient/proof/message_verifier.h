@@ -36,6 +36,10 @@ struct MessageVerifierOptions {
   /// exactly once. Nothing is covered without a signature: then they only must be there.
   std::vector<MessagePart> requiredParts;
 
+  /// Whether the signature must cover the token. Set it if all senders sign the token, as `SignMessage` does. Without it, an
+  /// attacker with two tokens of the same key can put one of them into a message that was signed with the other.
+  bool requireTokenCovered = false;
+
   /// Whether a bearer token without a proof is accepted. A holder-of-key token always needs a proof.
   bool acceptBearer = false;
 
@@ -106,11 +110,10 @@ public:
   /// @throws Tarvel::Xml::XMLParseException when the text is not a well-formed document.
   /// @throws InvalidMessageException when it is not an envelope with one body; when it does not have exactly one security
   ///         header for the role, with one token and at most one timestamp that can be read; when a signature in that header
-  ///         refers to another token, or two refer to the token; and when a required part is missing, is there twice or
-  ///         is not covered.
+  ///         refers to another token, or two refer to the token; when the token has no canonical form; and when a
+  ///         required part is missing, is there twice or is not covered.
   /// @throws StaleMessageException when the timestamp is in the future, has expired or is too old.
-  /// @throws ParseException, InvalidSignatureException and Tarvel::Xml::Security::XmlSecurityException, for the token, like
-  ///         `TokenVerifier::Verify` of an element.
+  /// @throws ParseException and InvalidSignatureException, for the token, like `TokenVerifier::Verify`.
   /// @throws InvalidProofException when the token's key did not sign the message and the sender did not authenticate with
   ///         it in TLS; when the signature is wrong or outside the profile; and for a bearer token, unless the options
   ///         accept it.

@@ -20,7 +20,10 @@ public:
   KeyContexts() = default;
   KeyContexts(const KeyContexts &) = delete;
   KeyContexts &operator=(const KeyContexts &) = delete;
-  ~KeyContexts() { m_contexts.FreeAll(); }
+  ~KeyContexts() { Clear(); }
+
+  /// Frees all kept contexts. Only while no other thread uses the object.
+  void Clear() noexcept { m_contexts.FreeAll(); }
 
   /// A context set up for `scheme` and `algorithm`; null if none is kept.
   KeyContextHandle Acquire(SignatureScheme scheme, DigestAlgorithm algorithm) noexcept {

@@ -100,7 +100,7 @@ KeyStore CreateKeyStoreFromPkcs12(std::string_view der, const PassphraseCallback
   OpenSslGuard guard;
   guard.Require();
   const Pkcs12Handle store = Decode(der);
-  Passphrase secret(passphrase, guard);
+  Passphrase secret(passphrase, guard, nullptr);
   NativeKeyStore native = Open(store.get(), FindPassphrase(store.get(), secret));
   if (!native.key) {
     throw NoKeyException("There is no private key in the PKCS#12 key store");

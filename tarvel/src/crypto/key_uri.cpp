@@ -93,7 +93,8 @@ Ref<const PrivateKey> LoadPrivateKeyFromUri(const std::string &uri, const Passph
   OpenSslGuard guard;
   guard.Require();
   const OpenSslErrorScope errors;
-  PassphraseRequest question{Passphrase(passphrase, guard), false, nullptr};
+  ProviderTurn turn(UsesSystemConfiguration());
+  PassphraseRequest question{Passphrase(passphrase, guard, &turn), false, nullptr};
   // Without this user-interface method, a loader would ask for the passphrase on the host's terminal.
   const UiMethodHandle ui(UI_UTIL_wrap_read_pem_callback(SupplyPassphrase, 0));
   if (!ui) {

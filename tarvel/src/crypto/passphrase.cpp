@@ -9,16 +9,26 @@ namespace Tarvel::Crypto {
 // The guard is suspended because the callback may wait while the user types, or start a program that asks.
 SecretText Passphrase::Ask() {
   m_guard.Suspend();
+  if (m_turn) {
+    m_turn->Suspend();
+  }
   try {
     SecretText answer = [this] {
       const HostCall call;
       return SecretText(m_ask());
     }();
-    m_guard.Resume();
+    Resume();
     return answer;
   } catch (...) {
-    m_guard.Resume();
+    Resume();
     throw;
+  }
+}
+
+void Passphrase::Resume() {
+  m_guard.Resume();
+  if (m_turn) {
+    m_turn->Resume();
   }
 }
 

@@ -5,6 +5,7 @@
 #pragma once
 
 #include "crypto/openssl_guard.h"
+#include "crypto/provider_turn.h"
 
 #include <tarvel/core/secret_text.h>
 #include <tarvel/crypto/private_key.h>
@@ -16,8 +17,10 @@ namespace Tarvel::Crypto {
 /// Asks its callback at most once, on the thread that first needs the passphrase.
 class Passphrase {
 public:
-  /// `ask` and `guard` must outlive this object. `guard` is suspended while `ask` runs.
-  Passphrase(const PassphraseCallback &ask, OpenSslGuard &guard) : m_ask(ask), m_guard(guard) {}
+  /// `ask`, `guard` and `turn`, which may be null, must outlive this object. `guard` and `turn` are suspended while `ask`
+  /// runs.
+  Passphrase(const PassphraseCallback &ask, OpenSslGuard &guard, ProviderTurn *turn)
+      : m_ask(ask), m_guard(guard), m_turn(turn) {}
   Passphrase(const Passphrase &) = delete;
   Passphrase &operator=(const Passphrase &) = delete;
 
@@ -28,9 +31,11 @@ public:
 
 private:
   SecretText Ask();
+  void Resume();
 
   const PassphraseCallback &m_ask;
   OpenSslGuard &m_guard;
+  ProviderTurn *const m_turn;
   bool m_asked = false;
   SecretText m_text;
 };

@@ -175,7 +175,8 @@ Ref<const PrivateKey> CreatePrivateKey(std::string_view text, const PassphraseCa
   OpenSslGuard::Prepare();
   OpenSslGuard guard;
   guard.Require();
-  Passphrase secret(passphrase, guard);
+  ProviderTurn turn(UsesSystemConfiguration());
+  Passphrase secret(passphrase, guard, &turn);
   if (PemReader::LooksLikePem(text)) {
     return MakeRef<PrivateKeyImpl>(DecodePem(text, secret));
   }

@@ -4,13 +4,15 @@
 
 #include "crypto/openssl_errors.h"
 #include "crypto/openssl_guard.h"
+#include "crypto/provider_turn.h"
 
 #include <typeinfo>
 #include <utility>
 
 namespace Tarvel::Crypto {
 
-PrivateKeyImpl::PrivateKeyImpl(KeyHandle native) : m_native(std::move(native)) {
+PrivateKeyImpl::PrivateKeyImpl(KeyHandle native)
+    : m_isInAddedProvider(Crypto::IsInAddedProvider(native.get())), m_native(std::move(native)) {
   const OpenSslGuard guard;
   guard.Require();
   const OpenSslErrorScope errors;
@@ -28,6 +30,12 @@ PrivateKeyImpl::PrivateKeyImpl(KeyHandle native) : m_native(std::move(native)) {
   const char *const algorithm = EVP_PKEY_get0_type_name(m_native.get());
   throw CryptoException(std::string("Private key of algorithm ") + (algorithm ? algorithm : "unknown") +
                         ", which is neither RSA nor EC");
+}
+
+PrivateKeyImpl::~PrivateKeyImpl() {
+  const ProviderTurn turn(m_isInAddedProvider); // a provider may have to remove the key from its hardware
+  m_signContexts.Clear();
+  m_native.reset();
 }
 
 const PrivateKeyImpl &AsImpl(const PrivateKey &key) {

@@ -19,16 +19,19 @@ public:
 
   std::string GetAlgorithm() const override { return m_algorithm; }
   unsigned GetBits() const override { return m_bits; }
+  /// Whether each use of the key needs a `ProviderTurn`.
+  bool IsInAddedProvider() const noexcept { return m_isInAddedProvider; }
   KeyContexts &GetSignContexts() const noexcept { return m_signContexts; }
 
   /// Owned by this object; OpenSSL counts its own references to it.
   EVP_PKEY *GetNative() const noexcept { return m_native.get(); }
 
 private:
-  ~PrivateKeyImpl() override = default;
+  ~PrivateKeyImpl() override;
 
   const char *m_algorithm = nullptr;
   unsigned m_bits = 0;
+  bool m_isInAddedProvider = false;
   KeyHandle m_native; // OpenSSL wipes the key's numbers when it frees them
   mutable KeyContexts m_signContexts;
 };

@@ -10,8 +10,10 @@
 #include "crypto/openssl_handles.h"
 #include "crypto/prepared_key.h"
 #include "crypto/private_key_impl.h"
+#include "crypto/provider_turn.h"
 #include "crypto/verifying_key_impl.h"
 
+#include <openssl/provider.h>
 #include <openssl/rsa.h>
 
 #include <string>
@@ -74,9 +76,16 @@ KeyContextHandle NewVerifyContext(EVP_PKEY *sharedKey, SignatureScheme scheme, D
   return context;
 }
 
+// Prefers the provider of the key. By default, OpenSSL 3.0 uses the first provider that has the algorithm, such as the default
+// one, and gives it what can be exported of the key. Of a key in a TPM, this is only the public part.
+std::string PreferOwnProvider(const EVP_PKEY *key) {
+  const OSSL_PROVIDER *const provider = EVP_PKEY_get0_provider(key);
+  return provider ? std::string("?provider=") + OSSL_PROVIDER_get0_name(provider) : "";
+}
+
 KeyContextHandle NewSignContext(EVP_PKEY *key, SignatureScheme scheme, DigestAlgorithm algorithm) {
   const OpenSslErrorScope errors;
-  KeyContextHandle context(EVP_PKEY_CTX_new_from_pkey(GetLibraryContext(), key, nullptr));
+  KeyContextHandle context(EVP_PKEY_CTX_new_from_pkey(GetLibraryContext(), key, PreferOwnProvider(key).c_str()));
   if (!context || EVP_PKEY_sign_init(context.get()) <= 0 || !SetScheme(context.get(), scheme, algorithm)) {
     errors.Throw("Failed to set up a signature");
   }
@@ -211,6 +220,7 @@ std::vector<std::uint8_t> SignDigest(const PrivateKey &key, SignatureScheme sche
     throw CryptoException("A key of algorithm " + key.GetAlgorithm() + " cannot make a signature of this scheme");
   }
   const PrivateKeyImpl &impl = AsImpl(key);
+  const ProviderTurn turn(impl.IsInAddedProvider());
   KeyContexts &contexts = impl.GetSignContexts();
   KeyContextHandle context = contexts.Acquire(scheme, algorithm);
   if (!context) {

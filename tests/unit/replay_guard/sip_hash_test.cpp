@@ -1,5 +1,8 @@
 // SPDX-License-Identifier: Apache-2.0
 // The hash is compared with OpenSSL's.
+#include "guarded_clock.h"
+
+#include "proof/remembered_messages.h"
 #include "proof/sip_hash.h"
 
 #include <gtest/gtest.h>
@@ -53,6 +56,18 @@ TEST(ComputeSipHash, IsTheHashThatOpenSslComputes) {
     EXPECT_EQ(SsoClient::ComputeSipHash({ReadNumber(key.data()), ReadNumber(key.data() + 8)}, identifier),
               HashByOpenSsl(key, identifier));
   }
+}
+
+// A tag of 0 marks an empty place, so the table uses another one for this identifier: the upper half of its hash is 0.
+TEST(RememberedMessages, FindsAnIdentifierWhoseHashBeginsWithZeros) {
+  constexpr std::uint64_t NUMBER = 6'271'983'464;
+  constexpr SsoClient::SipHashKey KEY{0, 0};
+  const MessageIdentifier identifier = MakeIdentifier(NUMBER);
+  ASSERT_EQ(SsoClient::ComputeSipHash(KEY, identifier) >> 32, 0u);
+  SsoClient::RememberedMessages messages(10, KEY);
+  const auto place = messages.Prepare(identifier);
+  EXPECT_EQ(messages.Remember(place, identifier, 2, 1), SsoClient::ReplayGuard::Answer::FIRST);
+  EXPECT_EQ(messages.Remember(place, identifier, 2, 1), SsoClient::ReplayGuard::Answer::REPEATED);
 }
 
 } // namespace

@@ -1,0 +1,100 @@
+// SPDX-License-Identifier: Apache-2.0
+
+#include "signed_elements.h"
+
+#include "judged_message.h"
+#include "message_files.h"
+
+#include "integration/signature_oracle/libxml2_oracle.h"
+
+#include <algorithm>
+#include <stdexcept>
+#include <string_view>
+#include <vector>
+
+namespace Messages {
+
+namespace {
+
+using SsoClient::VerifiedMessage;
+using Tarvel::Xml::AsElement;
+using Tarvel::Xml::ElementNode;
+using Tarvel::Xml::Node;
+
+/// The position of the element among the elements of its parent, and of each of its ancestors, from the document element.
+std::vector<std::size_t> PositionOf(const ElementNode &element) {
+  std::vector<std::size_t> position;
+  for (const Node *node = &element; AsElement(node->GetParent()); node = node->GetParent()) {
+    std::size_t before = 0;
+    for (const Node *one = node->GetParent()->GetFirstChild(); one != node; one = one->GetNextSibling()) {
+      before += AsElement(one) ? 1u : 0u;
+    }
+    position.insert(position.begin(), before);
+  }
+  return position;
+}
+
+const xmlNode *ChildElement(const xmlNode *parent, std::size_t index) {
+  const xmlNode *child = parent ? parent->children : nullptr;
+  while (child && (child->type != XML_ELEMENT_NODE || index-- != 0)) {
+    child = child->next;
+  }
+  return child;
+}
+
+const xmlNode *FindAt(xmlDoc &document, const std::vector<std::size_t> &position) {
+  const xmlNode *node = xmlDocGetRootElement(&document);
+  for (const std::size_t index : position) {
+    node = ChildElement(node, index);
+  }
+  return node;
+}
+
+/// The last child element of the document element: the body.
+const xmlNode *BodyOf(xmlDoc &document) {
+  return xmlLastElementChild(xmlDocGetRootElement(&document));
+}
+
+std::string CanonicalForm(xmlDoc &document, const xmlNode *apex) {
+  Testing::OracleMethod method;
+  method.isExclusive = true;
+  return Testing::CanonicalFormOfLibxml2(document, apex, nullptr, method);
+}
+
+} // namespace
+
+SignedElements::SignedElements() {
+  for (const MessageFile &file : AllMessageFiles()) {
+    if (!file.IsAccepted() || file.text != "message-signature") {
+      continue;
+    }
+    const Decision decision = Judge(MakeReceiver(file.options), file.xml);
+    const Testing::XmlDocHandle document = Testing::ParseWithLibxml2(file.xml);
+    for (const VerifiedMessage::CoveredElement &covered : decision.message.value().covered) {
+      if (!covered.omitted) {
+        m_canonicalForms.insert(CanonicalForm(*document, FindAt(*document, PositionOf(*covered.element))));
+      }
+    }
+  }
+  if (m_canonicalForms.size() < 5) {
+    throw std::logic_error("there are too few signed elements");
+  }
+}
+
+std::string SignedElements::FindFault(const std::string &xml, const VerifiedMessage &message) const {
+  const Testing::XmlDocHandle document = Testing::ParseWithLibxml2(xml);
+  if (!document) {
+    return "libxml2 does not read the message";
+  }
+  bool isBodyCovered = false;
+  for (const VerifiedMessage::CoveredElement &covered : message.covered) {
+    const xmlNode *const element = FindAt(*document, PositionOf(*covered.element));
+    if (covered.omitted || !element || m_canonicalForms.count(CanonicalForm(*document, element)) == 0) {
+      return covered.path + " was not signed";
+    }
+    isBodyCovered = isBodyCovered || element == BodyOf(*document);
+  }
+  return isBodyCovered ? "" : "the body is not covered";
+}
+
+} // namespace Messages
