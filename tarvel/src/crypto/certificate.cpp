@@ -6,8 +6,10 @@
 #include "crypto/key_file.h"
 #include "crypto/library_context.h"
 #include "crypto/openssl_errors.h"
+#include "crypto/openssl_guard.h"
 #include "crypto/openssl_handles.h"
 #include "crypto/pem_reader.h"
+#include "crypto/recent_certificates.h"
 
 namespace Tarvel::Crypto {
 
@@ -54,7 +56,16 @@ TARVEL_DEFINE_EXCEPTION(CryptoException)
 Certificate::~Certificate() = default;
 
 Ref<const Certificate> CreateCertificateFromDer(const std::uint8_t *data, std::size_t length) {
-  return MakeRef<CertificateImpl>(data, length);
+  {
+    const OpenSslGuard guard;
+    guard.Require();
+    if (Ref<const Certificate> recent = FindRecentCertificate(data, length)) {
+      return recent;
+    }
+  }
+  Ref<const Certificate> certificate = MakeRef<CertificateImpl>(data, length);
+  KeepRecentCertificate(certificate);
+  return certificate;
 }
 
 Ref<const Certificate> CreateCertificateFromPem(std::string_view pem) {

@@ -7,7 +7,9 @@
 
 #include "integration/signature_oracle/libxml2_oracle.h"
 
-#include <algorithm>
+#include <libxml/uri.h>
+
+#include <memory>
 #include <stdexcept>
 #include <string_view>
 #include <vector>
@@ -20,6 +22,11 @@ using SsoClient::VerifiedMessage;
 using Tarvel::Xml::AsElement;
 using Tarvel::Xml::ElementNode;
 using Tarvel::Xml::Node;
+
+struct UriDeleter {
+  void operator()(xmlURI *uri) const noexcept { xmlFreeURI(uri); }
+};
+using Uri = std::unique_ptr<xmlURI, UriDeleter>;
 
 /// The position of the element among the elements of its parent, and of each of its ancestors, from the document element.
 std::vector<std::size_t> PositionOf(const ElementNode &element) {
@@ -55,6 +62,27 @@ const xmlNode *BodyOf(xmlDoc &document) {
   return xmlLastElementChild(xmlDocGetRootElement(&document));
 }
 
+bool IsAbsolute(const std::string &uri) {
+  const Uri parsed(xmlParseURI(uri.c_str()));
+  return parsed && parsed->scheme;
+}
+
+/// Replaces namespace names without a scheme, because with one of them anywhere in a document libxml2 canonicalises no part
+/// of it. No genuine message has one in what is signed.
+void MakeNamespaceNamesAbsolute(xmlNode *top) {
+  for (xmlNode *node = top; node; node = node->next) {
+    for (xmlNs *declared = node->type == XML_ELEMENT_NODE ? node->nsDef : nullptr; declared;
+         declared = declared->next) {
+      const std::string name = reinterpret_cast<const char *>(declared->href);
+      if (!name.empty()) {
+        xmlFree(const_cast<xmlChar *>(declared->href));
+        declared->href = xmlStrdup(Testing::XmlText(IsAbsolute(name) ? name.c_str() : ("urn:" + name).c_str()));
+      }
+    }
+    MakeNamespaceNamesAbsolute(node->children);
+  }
+}
+
 std::string CanonicalForm(xmlDoc &document, const xmlNode *apex) {
   Testing::OracleMethod method;
   method.isExclusive = true;
@@ -86,6 +114,7 @@ std::string SignedElements::FindFault(const std::string &xml, const VerifiedMess
   if (!document) {
     return "libxml2 does not read the message";
   }
+  MakeNamespaceNamesAbsolute(document->children);
   bool isBodyCovered = false;
   for (const VerifiedMessage::CoveredElement &covered : message.covered) {
     const xmlNode *const element = FindAt(*document, PositionOf(*covered.element));
