@@ -45,6 +45,7 @@ SsoClient::TokenVerifier MakeTokenVerifier(const Tarvel::Crypto::CertificateList
 
 SsoClient::MessageVerifierOptions MakeOptions(std::size_t remembered) {
   SsoClient::MessageVerifierOptions options; // requires a timestamp, and that body and timestamp are signed
+  options.requireTokenCovered = true;        // our clients sign it, as `SignMessage` does
   options.replayGuard = SsoClient::CreateMemoryReplayGuard(remembered);
   return options;
 }
