@@ -105,6 +105,7 @@ void SignMessage(Tarvel::Xml::Document &envelope, const SamlToken &token, const 
 
   TokenAttachment attachment(envelope, token, options);
   std::vector<ElementNode *> elements;
+  elements.reserve(parts.size() + 2);
   for (const MessagePart &part : parts) {
     elements.push_back(&attachment.FindPart(part));
   }

@@ -16,8 +16,9 @@ namespace {
 
 constexpr const char *COVERAGE = "the signature must cover the body and the timestamp, and nothing else but header "
                                  "blocks and the token";
-constexpr const char *NO_PROOF = "the sender does not prove that it has the token's key: the message is not signed with "
-                                 "it, and the connection has no client certificate with it";
+constexpr const char *NO_PROOF =
+    "the sender does not prove that it has the token's key: the message is not signed with "
+    "it, and the connection has no client certificate with it";
 constexpr const char *NOT_THE_TOKEN = "the signature's key reference does not refer to the token";
 
 /// Whether the header block is for the last receiver, which is this service.
@@ -110,8 +111,7 @@ void CheckSignature(const SecurityHeader &security, const Identifiers &identifie
   }
   RequireCoverage(*security.signature, identifiers, std::move(rule));
   CheckKeyInfo(security, holder);
-  std::optional<std::vector<unsigned char>> signedInfo =
-      VerifiedSignedInfo(*security.signature, PublicKeyOf(holder));
+  std::optional<std::vector<unsigned char>> signedInfo = VerifiedSignedInfo(*security.signature, PublicKeyOf(holder));
   if (!signedInfo) {
     throw Refusal(Code::FAILED_CHECK, "the message's signature is wrong, or made with another key than the token's");
   }

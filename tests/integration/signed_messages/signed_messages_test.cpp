@@ -23,9 +23,15 @@ struct Holder {
 };
 
 const Holder HOLDERS[] = {
-    {"tokens/holder-of-key", "holder", "sts-rsa"},        {"saml2/holder-certificate", "holder", "sts-rsa"},
-    {"saml2/holder-rsa-value", "holder", "sts-rsa"},      {"saml2/holder-ec-value", "sts-ec256", "sts-rsa"},
-    {"saml2/holder-ec384-value", "sts-ec384", "sts-rsa"}, {"saml2/holder-ec-certificate", "sts-ec521", "sts-rsa"},
+    {"tokens/holder-of-key", "holder", "sts-rsa"},
+    {"saml2/holder-certificate", "holder", "sts-rsa"},
+    {"saml2/holder-rsa-value", "holder", "sts-rsa"},
+    {"saml2/holder-ec-value", "sts-ec256", "sts-rsa"},
+    {"saml2/holder-ec384-value", "sts-ec384", "sts-rsa"},
+    {"saml2/holder-ec-certificate", "sts-ec521", "sts-rsa"},
+    {"tokens/c14n-inclusive-prefixes", "holder", "sts-rsa"},
+    {"tokens/c14n-exclusive-with-comments", "holder", "sts-rsa"},
+    {"tokens/style-default-namespace", "holder", "sts-rsa"},
 };
 
 /// A message of a program.
@@ -131,7 +137,7 @@ TEST_P(SignedMessage, CanGetABearerTokenThatStaysValid) {
   SecurityHeaderOptions options;
   options.role = "urn:role";
   for (const char *const name :
-       {"tokens/bearer", "tokens/full", "tokens/style-default-namespace", "saml2/name-email"}) {
+       {"tokens/bearer", "tokens/bearer-5k", "tokens/rsa-sha512", "saml2/name-email", "saml2/attributes-known"}) {
     const ForeignDocument message(AttachToken(GetParam().message, *SampleToken(name), options));
     const xmlNodePtr assertion = Find(message.Root(), "Assertion");
     EXPECT_TRUE(IsValidSignature(Child(assertion, "Signature"), ReadKey("sts-rsa", ".crt"))) << name;
