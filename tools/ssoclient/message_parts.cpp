@@ -41,6 +41,7 @@ void AddMessageArgument(CLI::App &app, std::string &file) {
 
 std::vector<MessagePart> ParseParts(const std::vector<std::string> &texts) {
   std::vector<MessagePart> parts;
+  parts.reserve(texts.size());
   for (const std::string &text : texts) {
     parts.push_back(ParsePart(text));
   }
