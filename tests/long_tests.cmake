@@ -14,6 +14,8 @@ ssoclient_mark(30 in_full
   PrefixesOfDocuments.AreReadAlikeByAllReaders
   GeneratedDocuments.AreReadAlikeByAllReadersExceptForNamedDifferences)
 ssoclient_mark(20 in_full
+  ChangedMessages.AreAcceptedOnlyIfTheCoveredElementsAreTheSignedOnes
+  HostileHeader.IsExplainedInLinearTime
   TokenSourceModel.DoesTheSameAsTheSourceAfterEachOfManyRandomEvents
   PositionOfRefusal.IsOnTheLineThatLibxml2ReportsExceptForNamedDifferences
   PositionOfRefusal.IsAfterTextThatAWellFormedDocumentMayBeginWith
