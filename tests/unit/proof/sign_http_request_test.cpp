@@ -102,10 +102,12 @@ struct Holder {
   const char *token;
 };
 
+constexpr Holder HOLDERS[] = {{"tokens/holder", "tokens/holder-of-key"},
+                              {"crypto/p256", "http/holder-p256"},
+                              {"crypto/p384", "http/holder-p384"}};
+
 TEST(SignHttpRequest, IsVerifiedByAProgramThatSharesNothingWithIt) {
-  for (const auto &[key, file] :
-       {Holder{"tokens/holder", "tokens/holder-of-key"}, Holder{"crypto/p256", "http/holder-p256"},
-        Holder{"crypto/p384", "http/holder-p384"}}) {
+  for (const Holder &holder : HOLDERS) {
     const std::string tokenFile = std::string(holder.token) + ".xml";
     const auto token = Testing::HttpTokenVerifier().Verify(ReadDataFile(tokenFile));
     HttpSigningOptions options;
@@ -128,9 +130,7 @@ TEST(SignHttpRequest, IsVerifiedByAProgramThatSharesNothingWithIt) {
 }
 
 TEST(SignHttpRequest, IsAcceptedByVerifyHttpProof) {
-  for (const auto &[key, file] :
-       {Holder{"tokens/holder", "tokens/holder-of-key"}, Holder{"crypto/p256", "http/holder-p256"},
-        Holder{"crypto/p384", "http/holder-p384"}}) {
+  for (const Holder &holder : HOLDERS) {
     const TokenVerifier verifier = Testing::HttpTokenVerifier();
     const auto token = verifier.Verify(ReadDataFile(std::string(holder.token) + ".xml"));
     for (const boost::optional<std::string> &body :
