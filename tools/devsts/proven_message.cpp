@@ -74,7 +74,7 @@ void ReadEnvelope(const SoapVersion &version, ProvenMessage &message) {
 void RequireReferenceTo(const xmlNode &assertion, const xmlNode &reference) {
   const std::string type = AttributeOf(reference, Ns::WSSE11, "TokenType").value_or(SAML_PROFILE_TOKEN_TYPE);
   const std::vector<xmlNode *> pointers = ChildElements(reference);
-  const bool isKnownType = type == SAML_PROFILE_TOKEN_TYPE || type == SAML_TOKEN_TYPE;
+  const bool isKnownType = type == SAML_PROFILE_TOKEN_TYPE || type == ESTABLISHED_TOKEN_TYPE;
   const bool isByIdentifier =
       pointers.size() == 1 && IsElement(*pointers[0], Ns::WSSE, "KeyIdentifier") && Identifies(*pointers[0], assertion);
   const bool isByUri = pointers.size() == 1 && IsElement(*pointers[0], Ns::WSSE, "Reference") &&

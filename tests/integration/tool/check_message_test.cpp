@@ -4,6 +4,8 @@
 #include "message_test.h"
 #include "token_values.h"
 
+#include <tarvel/system/date_time.h>
+
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
 #include <nlohmann/json.hpp>
@@ -245,7 +247,8 @@ TEST_F(CheckMessage, RefusesAWrongCommandLineAndMissingFiles) {
          "usage: --message-tolerance: must be a number from 0 to 86400; see ssoclient --help");
   expect("--trust sts.pem --part } envelope.xml", 2, "usage: --part must be {NAMESPACE}NAME, which '}' is not");
   expect("--trust sts.pem missing.xml", 7, "file: missing.xml: No such file or directory");
-  expect("--trust sts.pem --peer-cert missing.pem envelope.xml", 7, "file: missing.pem: No such file or directory");
+  expect("--trust sts.pem --peer-cert missing.pem envelope.xml", 7,
+         "file: Cannot open missing.pem: No such file or directory");
 }
 
 } // namespace
