@@ -74,4 +74,10 @@ void KeepRecentCertificate(const Ref<const Certificate> &certificate) noexcept {
   }
 }
 
+void ForgetRecentCertificates() noexcept {
+  for (Place &place : places) {
+    Take(place);
+  }
+}
+
 } // namespace Tarvel::Crypto
