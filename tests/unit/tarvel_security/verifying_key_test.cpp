@@ -77,7 +77,7 @@ TEST(VerifyWithKey, ReportsTheTargetsInTheOrderOfTheReferences) {
   const std::vector<Signature::Coverage::Target> &targets = verified.coverage.targets;
   ASSERT_EQ(SignatureOf(*verified.document)->GetReferences().size(), targets.size());
   ASSERT_EQ(2u, targets.size());
-  EXPECT_EQ(&FindElement(*verified.document, "Issuer"), targets[0].node);
+  EXPECT_EQ(&FindElement(*verified.document, "KeyInfo"), targets[0].node);
   EXPECT_FALSE(targets[0].omitsSignature);
   EXPECT_EQ(verified.document->GetDocumentElement(), targets[1].node);
   EXPECT_TRUE(targets[1].omitsSignature);
