@@ -168,13 +168,13 @@ void FillGuard(benchmark::State &state) {
   const Tarvel::ScopedEnvironment clock({[] { return std::int64_t{0}; }, {}});
   for (auto _ : state) {
     state.PauseTiming();
-    FullGuard full;
+    auto full = std::make_unique<FullGuard>();
     state.ResumeTiming();
     for (std::size_t i = 0; i < MESSAGES; ++i) {
-      full.Remember();
+      full->Remember();
     }
     state.PauseTiming();
-    full = {};
+    full.reset();
     state.ResumeTiming();
   }
 }

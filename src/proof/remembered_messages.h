@@ -4,6 +4,7 @@
 
 #pragma once
 
+#include "proof/large_page_allocator.h"
 #include "proof/sip_hash.h"
 
 #include <ssoclient/proof/replay_guard.h>
@@ -58,9 +59,11 @@ private:
   const std::size_t m_capacity;
   const SipHashKey m_key;
   // One element for each slot. The arrays are separate so that a search touches little memory.
-  std::vector<std::uint32_t> m_tags; // 0 in an empty slot
-  std::vector<std::int64_t> m_untils;
-  std::vector<MessageIdentifier> m_identifiers;
+  template <typename T>
+  using Array = std::vector<T, LargePageAllocator<T>>;
+  Array<std::uint32_t> m_tags; // 0 in an empty slot
+  Array<std::int64_t> m_untils;
+  Array<MessageIdentifier> m_identifiers;
   std::size_t m_count = 0;
   std::size_t m_sweep = 0; // the slot at which the next sweep begins
   // The latest end of a time for which an identifier that was removed was remembered. Only after the clock was set back, it

@@ -72,7 +72,7 @@ void TokenElement::ReadOwnSignatures() {
 void TokenElement::AddIncludedPrefixes(const ElementNode &apex, std::string_view prefixList) {
   ForEachPrefix(prefixList, [&](std::string_view prefix) {
     std::string_view uri;
-    if (prefix != "#default" && !apex.LookupNamespace(prefix, uri)) {
+    if (!apex.LookupNamespace(prefix, uri)) {
       m_includedPrefixes.emplace_back(prefix);
     }
     return true;

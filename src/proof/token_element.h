@@ -40,7 +40,7 @@ private:
 
   Tarvel::Ref<Tarvel::Xml::ElementNode> m_assertion;
   std::set<std::string, std::less<>> m_identifiers;
-  std::vector<std::string> m_includedPrefixes; ///< the signature includes them, and the assertion does not declare them
+  std::vector<std::string> m_includedPrefixes; ///< the signature includes them, and the token does not declare them
 };
 
 } // namespace SsoClient

@@ -41,5 +41,7 @@
       [[maybe_unused]] const std::shared_ptr<const SsoClient::TokenClient> &client,                                    \
       [[maybe_unused]] const std::shared_ptr<const SsoClient::TokenSource> &source,                                    \
       [[maybe_unused]] const SsoClient::CredentialProvider &provider,                                                  \
+      [[maybe_unused]] const Tarvel::Crypto::PrivateKey &key, [[maybe_unused]] const std::string &envelope,            \
+      [[maybe_unused]] SsoClient::HttpRequest &request, [[maybe_unused]] const Tarvel::Crypto::Certificate &peer,      \
       [[maybe_unused]] const std::function<std::shared_ptr<SsoClient::NegotiationHandler>()> &makeHandler,             \
       [[maybe_unused]] std::vector<std::function<void()>> &eventLoop

@@ -96,7 +96,8 @@ private:
   std::vector<std::thread> m_threads;
 };
 
-HttpsListener::Server::Server(const Identity &identity, std::uint16_t port, bool asksForCertificates, const RequestHandler &handler)
+HttpsListener::Server::Server(const Identity &identity, std::uint16_t port, bool asksForCertificates,
+                              const RequestHandler &handler)
     : m_tls(asio::ssl::context::tls_server), m_handler(handler) {
   SetUpTls(m_tls, identity);
   if (asksForCertificates) {

@@ -38,6 +38,9 @@ constexpr const char *SHA256 = "http://www.w3.org/2001/04/xmlenc#sha256";
 constexpr const char *SAML_TOKEN_TYPE = "urn:oasis:names:tc:SAML:2.0:assertion";
 constexpr const char *SAML_PROFILE_TOKEN_TYPE =
     "http://docs.oasis-open.org/wss/oasis-wss-saml-token-profile-1.1#SAMLV2.0";
+/// The spelling of the same type that other services use in references to a token.
+constexpr const char *ESTABLISHED_TOKEN_TYPE =
+    "http://docs.oasis-open.org/wss/oasis-wss-saml-tokenprofile-1.1#SAMLV2.0";
 constexpr const char *BEARER_METHOD = "urn:oasis:names:tc:SAML:2.0:cm:bearer";
 constexpr const char *HOLDER_OF_KEY_METHOD = "urn:oasis:names:tc:SAML:2.0:cm:holder-of-key";
 constexpr const char *PASSWORD_CONTEXT = "urn:oasis:names:tc:SAML:2.0:ac:classes:PasswordProtectedTransport";

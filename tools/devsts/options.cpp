@@ -15,14 +15,17 @@ std::string Footer() {
   return "Faults:\n" + FaultHelp() +
          "\nA request to URL/fault/NAME gets that fault, whatever --fault says.\n"
          "At URL/fault/NAME/once/TEXT only the first request gets it; each TEXT is counted separately.\n"
-         "\nThe service at /echo of the same port answers a SOAP 1.1 or 1.2 message with the same body, if its security\n"
+         "\nThe service at /echo of the same port answers a SOAP 1.1 or 1.2 message with the same body, if its "
+         "security\n"
          "header has a token of this service for the audience https://localhost/echo, or for any, and the message is\n"
-         "signed with the token's key: body and timestamp, and nothing else but header blocks and the token. It refuses\n"
+         "signed with the token's key: body and timestamp, and nothing else but header blocks and the token. It "
+         "refuses\n"
          "a message that it has received before. No fault changes its answers.\n"
          "\nExamples:\n"
          "  ssoclient-devsts --state ~/.cache/devsts\n"
          "      Serves alice@corp.example (password wonderland) and bob@corp.example (password builder) on a free\n"
-         "      port, until it gets SIGTERM or SIGINT. The first line on standard output is JSON with the URLs and the\n"
+         "      port, until it gets SIGTERM or SIGINT. The first line on standard output is JSON with the URLs and "
+         "the\n"
          "      files to trust.\n"
          "  ssoclient-devsts --state DIR --port 8443 --users users.json\n"
          "      users.json: "
@@ -44,6 +47,12 @@ Fault RequireFault(const std::string &name) {
     throw CLI::ValidationError("--fault", "unknown fault '" + name + "'; see --help");
   }
   return *fault;
+}
+
+void AddEchoOptions(CLI::App &app, Options &options) {
+  app.add_flag("--echo-bearer", options.acceptsBearer, "The echo service accepts bearer tokens, too");
+  app.add_flag("--client-certificates", options.asksForCertificates,
+               "Ask clients for a TLS certificate; the echo service accepts that of the token as proof");
 }
 
 } // namespace
@@ -71,9 +80,7 @@ std::variant<Options, int> ReadOptions(int argc, char **argv) {
   app.add_option("--tolerance", tolerance, "How far clocks may differ, in seconds")
       ->capture_default_str()
       ->check(CLI::Range(0, LONGEST_TOLERANCE));
-  app.add_flag("--echo-bearer", options.acceptsBearer, "The echo service accepts bearer tokens, too");
-  app.add_flag("--client-certificates", options.asksForCertificates,
-               "Ask clients for a TLS certificate; the echo service accepts that of the token as proof");
+  AddEchoOptions(app, options);
   app.add_flag("--until-eof", options.untilEof, "End when standard input ends");
   try {
     app.parse(argc, argv);

@@ -16,8 +16,9 @@ namespace {
 
 constexpr const char *COVERAGE = "the signature must cover the body and the timestamp, and nothing else but header "
                                  "blocks and the token";
-constexpr const char *NO_PROOF = "the sender does not prove that it has the token's key: the message is not signed with "
-                                 "it, and the connection has no client certificate with it";
+constexpr const char *NO_PROOF =
+    "the sender does not prove that it has the token's key: the message is not signed with "
+    "it, and the connection has no client certificate with it";
 constexpr const char *NOT_THE_TOKEN = "the signature's key reference does not refer to the token";
 
 /// Whether the header block is for the last receiver, which is this service.
@@ -73,7 +74,7 @@ void ReadEnvelope(const SoapVersion &version, ProvenMessage &message) {
 void RequireReferenceTo(const xmlNode &assertion, const xmlNode &reference) {
   const std::string type = AttributeOf(reference, Ns::WSSE11, "TokenType").value_or(SAML_PROFILE_TOKEN_TYPE);
   const std::vector<xmlNode *> pointers = ChildElements(reference);
-  const bool isKnownType = type == SAML_PROFILE_TOKEN_TYPE || type == SAML_TOKEN_TYPE;
+  const bool isKnownType = type == SAML_PROFILE_TOKEN_TYPE || type == ESTABLISHED_TOKEN_TYPE;
   const bool isByIdentifier =
       pointers.size() == 1 && IsElement(*pointers[0], Ns::WSSE, "KeyIdentifier") && Identifies(*pointers[0], assertion);
   const bool isByUri = pointers.size() == 1 && IsElement(*pointers[0], Ns::WSSE, "Reference") &&
@@ -110,8 +111,7 @@ void CheckSignature(const SecurityHeader &security, const Identifiers &identifie
   }
   RequireCoverage(*security.signature, identifiers, std::move(rule));
   CheckKeyInfo(security, holder);
-  std::optional<std::vector<unsigned char>> signedInfo =
-      VerifiedSignedInfo(*security.signature, PublicKeyOf(holder));
+  std::optional<std::vector<unsigned char>> signedInfo = VerifiedSignedInfo(*security.signature, PublicKeyOf(holder));
   if (!signedInfo) {
     throw Refusal(Code::FAILED_CHECK, "the message's signature is wrong, or made with another key than the token's");
   }

@@ -16,7 +16,8 @@ namespace Crypto = Tarvel::Crypto;
 constexpr const char *GROUP = "Identity";
 
 HolderOfKeyConfig LoadStore(const IdentityOptions &options) {
-  const Crypto::KeyStore store = Crypto::LoadKeyStore(options.p12File, AskForPassphrase(options.passphrase, options.p12File));
+  const Crypto::KeyStore store =
+      Crypto::LoadKeyStore(options.p12File, AskForPassphrase(options.passphrase, options.p12File));
   return {store.privateKey, store.certificate};
 }
 

@@ -39,7 +39,8 @@ struct SecurityHeaderOptions {
   /// How long the message is valid, in seconds, from now; positive. Used if the header gets a new `wsu:Timestamp`.
   std::int64_t lifetimeSec = DEFAULT_MESSAGE_LIFETIME_SEC;
 
-  /// Only `standardTokenTypeReference` is used: the spelling of the token type in the reference to the token.
+  /// Only `standardTokenTypeReference` is used: the spelling of the token type in the reference to the token. Receivers that
+  /// enforce the Basic Security Profile refuse messages without it.
   ServiceDialect dialect;
 };
 

@@ -5,6 +5,7 @@
 #include "crypto/openssl_errors.h"
 #include "crypto/openssl_guard.h"
 #include "crypto/provider_turn.h"
+#include "crypto/subject_public_key_der.h"
 
 #include <typeinfo>
 #include <utility>
@@ -33,9 +34,33 @@ PrivateKeyImpl::PrivateKeyImpl(KeyHandle native)
 }
 
 PrivateKeyImpl::~PrivateKeyImpl() {
+  if (const VerifyingKey *const publicKey = m_publicKey.load()) {
+    publicKey->Release();
+  }
   const ProviderTurn turn(m_isInAddedProvider); // a provider may have to remove the key from its hardware
   m_signContexts.Clear();
   m_native.reset();
+}
+
+// A key of a provider may have no readable private numbers. Its public numbers are encoded and decoded again, so that the
+// result is an ordinary key.
+Ref<const VerifyingKey> PrivateKeyImpl::GetPublicKey() const {
+  if (const VerifyingKey *const kept = m_publicKey.load(std::memory_order_acquire)) {
+    return Ref<const VerifyingKey>(kept);
+  }
+  const OpenSslGuard guard;
+  guard.Require();
+  const OpenSslErrorScope errors;
+  const auto der = [&] {
+    const ProviderTurn turn(m_isInAddedProvider);
+    return EncodeDer<const EVP_PKEY *>(i2d_PUBKEY, m_native.get(), errors);
+  }();
+  Ref<const VerifyingKey> made = CreateVerifyingKey(der);
+  const VerifyingKey *expected = nullptr;
+  if (m_publicKey.compare_exchange_strong(expected, made.get(), std::memory_order_acq_rel)) {
+    made->AddRef();
+  }
+  return made;
 }
 
 const PrivateKeyImpl &AsImpl(const PrivateKey &key) {

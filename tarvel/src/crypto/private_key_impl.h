@@ -8,6 +8,9 @@
 #include "crypto/openssl_handles.h"
 
 #include <tarvel/crypto/private_key.h>
+#include <tarvel/crypto/verifying_key.h>
+
+#include <atomic>
 
 namespace Tarvel::Crypto {
 
@@ -23,6 +26,10 @@ public:
   bool IsInAddedProvider() const noexcept { return m_isInAddedProvider; }
   KeyContexts &GetSignContexts() const noexcept { return m_signContexts; }
 
+  /// The public key that belongs to it. Encoding it costs nearly as much as a signature, so it is kept after the first call.
+  /// @throws CryptoException when the provider of the key fails; InvalidStateException; OutOfMemoryException.
+  Ref<const VerifyingKey> GetPublicKey() const;
+
   /// Owned by this object; OpenSSL counts its own references to it.
   EVP_PKEY *GetNative() const noexcept { return m_native.get(); }
 
@@ -34,6 +41,7 @@ private:
   bool m_isInAddedProvider = false;
   KeyHandle m_native; // OpenSSL wipes the key's numbers when it frees them
   mutable KeyContexts m_signContexts;
+  mutable std::atomic<const VerifyingKey *> m_publicKey{nullptr}; // with one count of its references
 };
 
 /// Downcasts `key`.

@@ -86,14 +86,8 @@ Ref<const VerifyingKey> CreateVerifyingKey(const Ref<const Certificate> &certifi
   return MakeRef<VerifyingKeyImpl>(AsImpl(*certificate).ShareKey(), GetSubjectPublicKey(*certificate));
 }
 
-// A key of a provider may have no readable private numbers. Its public numbers are encoded and decoded again, so that the
-// result is an ordinary key.
 Ref<const VerifyingKey> CreateVerifyingKey(const PrivateKey &key) {
-  const PrivateKeyImpl &impl = AsImpl(key);
-  const OpenSslGuard guard;
-  guard.Require();
-  const OpenSslErrorScope errors;
-  return CreateVerifyingKey(EncodeDer<const EVP_PKEY *>(i2d_PUBKEY, impl.GetNative(), errors));
+  return AsImpl(key).GetPublicKey();
 }
 
 bool IsSameKey(const VerifyingKey &left, const VerifyingKey &right) {

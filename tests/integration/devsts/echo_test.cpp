@@ -6,7 +6,7 @@
 namespace DevStsTest {
 namespace {
 
-constexpr const char *SAML2 = "urn:oasis:names:tc:SAML:2.0:assertion";
+constexpr const char *ESTABLISHED = "http://docs.oasis-open.org/wss/oasis-wss-saml-tokenprofile-1.1#SAMLV2.0";
 constexpr const char *NO_PROOF =
     "the sender does not prove that it has the token's key: the message is not signed with "
     "it, and the connection has no client certificate with it";
@@ -63,7 +63,7 @@ TEST_F(Echo, AcceptsEachReferenceToTheToken) {
   const std::string certificate =
       Between(m_service.ReadStateFile("client.crt"), "-----BEGIN CERTIFICATE-----", "-----END CERTIFICATE-----");
   const std::vector<std::string> references = {
-      ReferenceToToken(id, SAML2), Replaced(m_message.keyInfo, " wsse11:TokenType", " other"),
+      ReferenceToToken(id, ESTABLISHED), Replaced(m_message.keyInfo, " wsse11:TokenType", " other"),
       "<wsse:SecurityTokenReference><wsse:Reference URI=\"#" + id + "\"/></wsse:SecurityTokenReference>",
       "<ds:X509Data><ds:X509Certificate>" + certificate + "</ds:X509Certificate></ds:X509Data>"};
   for (const std::string &keyInfo : references) {
@@ -161,7 +161,7 @@ TEST_F(Echo, RefusesKeyReferencesToAnythingElse) {
   const std::string other =
       Between(m_service.ReadStateFile("other-client.crt"), "-----BEGIN CERTIFICATE-----", "-----END CERTIFICATE-----");
   const std::vector<std::string> references = {
-      ReferenceToToken(id + "0", SAML2),
+      ReferenceToToken(id + "0", ESTABLISHED),
       ReferenceToToken(id, "urn:oasis:names:tc:SAML:1.0:assertion"),
       Replaced(m_message.keyInfo, "#SAMLID", "#SAMLAssertionID"),
       m_message.keyInfo + m_message.keyInfo,

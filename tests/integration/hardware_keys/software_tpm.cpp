@@ -99,9 +99,18 @@ std::string SoftwareTpm::IssueCertificate(const std::string &keyUri, const std::
                                           const std::string &authorityKey) {
   Run("openssl req -new -propquery '?provider=tpm2' -subj /O=corp.example/CN=client -key " + keyUri +
       " -out request.pem");
-  Run("OPENSSL_CONF=/dev/null openssl x509 -req -in request.pem -CA '" + authority + "' -CAkey '" + authorityKey +
+  return SignRequest("request.pem", authority, authorityKey);
+}
+
+std::string SoftwareTpm::SignRequest(const std::string &request, const std::string &authority,
+                                     const std::string &authorityKey) const {
+  Run("OPENSSL_CONF=/dev/null openssl x509 -req -in " + request + " -CA '" + authority + "' -CAkey '" + authorityKey +
       "' -set_serial 1 -days 30 -extfile client.ext -out client.pem");
   return m_folder / "client.pem";
+}
+
+const char *SoftwareTpm::GetTool() noexcept {
+  return SSOCLIENT_TOOL;
 }
 
 void SoftwareTpm::SetEnvironment() const {

@@ -39,6 +39,13 @@ public:
   std::string IssueCertificate(const std::string &keyUri, const std::string &authority,
                                const std::string &authorityKey);
 
+  /// The same for a request for a certificate, a file of the folder.
+  std::string SignRequest(const std::string &request, const std::string &authority,
+                          const std::string &authorityKey) const;
+
+  /// The path of the tool.
+  static const char *GetTool() noexcept;
+
   /// Sets the environment of this process so that OpenSSL's configuration has the TPM's provider. Programs that this
   /// process starts use it, too.
   void SetEnvironment() const;

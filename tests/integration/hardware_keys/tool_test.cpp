@@ -23,7 +23,7 @@ protected:
 
 std::string Tool(const std::string &command, const DevSts &service, const std::string &certificate,
                  const std::string &key, const std::string &rest) {
-  return std::string(SSOCLIENT_TOOL) + " " + command + " --system-crypto --sts " + service.GetUrl() + " --ca " +
+  return std::string(SoftwareTpm::GetTool()) + " " + command + " --system-crypto --sts " + service.GetUrl() + " --ca " +
          service.PathOf("authority.crt") + " --trust " + service.PathOf("signing.crt") + " --cert " + certificate +
          " --key " + key + " " + rest;
 }

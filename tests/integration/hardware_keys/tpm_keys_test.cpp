@@ -5,6 +5,10 @@
 #include "support/dev_sts.h"
 #include "support/throws_message.h"
 
+#include <ssoclient/proof/http_proof.h>
+#include <ssoclient/proof/message_verifier.h>
+#include <ssoclient/proof/sign_http_request.h>
+#include <ssoclient/proof/sign_message.h>
 #include <ssoclient/security_token_service.h>
 #include <tarvel/crypto/detached_signature.h>
 #include <tarvel/crypto/private_key.h>
@@ -90,6 +94,13 @@ protected:
     return SsoClient::CreateSecurityTokenService(config);
   }
 
+  static SsoClient::TokenSpec Spec() {
+    SsoClient::TokenSpec spec;
+    spec.tokenLifetimeSec = 3600;
+    spec.renewable = true;
+    return spec;
+  }
+
   static std::unique_ptr<World> s_world;
 };
 
@@ -152,16 +163,37 @@ TEST_F(KeyInATpm, IsLoadedAndSignsOnSeveralThreads) {
 
 TEST_F(KeyInATpm, AcquiresAndRenewsTokens) {
   const auto service = Service();
-  SsoClient::TokenSpec spec;
-  spec.tokenLifetimeSec = 3600;
-  spec.renewable = true;
-  const auto token = service->AcquireTokenByCertificate(spec);
+  const auto token = service->AcquireTokenByCertificate(Spec());
   ASSERT_TRUE(token->GetConfirmationCertificate());
   EXPECT_EQ(token->GetConfirmationCertificate()->GetSha256Thumbprint(), ClientCertificate()->GetSha256Thumbprint());
   const auto renewed = service->RenewToken(*token, 3600);
   EXPECT_NE(renewed->GetId(), token->GetId());
   EXPECT_TRUE(IsSameKey(*CreateVerifyingKey(*Rsa()),
                         *CreateVerifyingKey(Tarvel::Ref<const Certificate>(renewed->GetConfirmationCertificate()))));
+}
+
+TEST_F(KeyInATpm, SignsMessages) {
+  const auto token = Service()->AcquireTokenByCertificate(Spec());
+  const std::string message = SsoClient::SignMessage(
+      "<s:Envelope xmlns:s='http://www.w3.org/2003/05/soap-envelope'><s:Body><read/></s:Body></s:Envelope>", *token,
+      *Rsa());
+  const SsoClient::MessageVerifier verifier{SsoClient::TokenVerifier(Signers())};
+  const SsoClient::VerifiedMessage verified = verifier.Verify(message);
+  EXPECT_EQ(verified.proof, SsoClient::ProofKind::MESSAGE_SIGNATURE);
+  EXPECT_EQ(verified.token->GetId(), token->GetId());
+  EXPECT_TRUE(verified.IsCovered(*verified.body));
+}
+
+TEST_F(KeyInATpm, SignsHttpRequests) {
+  const auto token = Service()->AcquireTokenByCertificate(Spec());
+  SsoClient::HttpRequest request{"POST", "https://files.corp.example/read", {}, std::string("content")};
+  for (const auto &field : SsoClient::SignHttpRequest(request, *token, *Rsa())) {
+    request.headers.push_back(field);
+  }
+  const SsoClient::VerifiedHttpRequest verified =
+      SsoClient::VerifyHttpProof(request, SsoClient::TokenVerifier(Signers()));
+  EXPECT_EQ(verified.proof, SsoClient::ProofKind::MESSAGE_SIGNATURE);
+  EXPECT_EQ(verified.token->GetId(), token->GetId());
 }
 
 TEST_F(KeyInATpm, IsReportedWhenItIsMissing) {

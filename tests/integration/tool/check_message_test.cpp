@@ -4,6 +4,8 @@
 #include "message_test.h"
 #include "token_values.h"
 
+#include <tarvel/system/date_time.h>
+
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
 #include <nlohmann/json.hpp>
@@ -103,6 +105,22 @@ TEST_F(CheckMessage, AcceptsTheCertificateOfTheTlsConnectionAsProof) {
   ExpectRefused(message, 6, "proof invalid",
                 std::string(NOT_SIGNED) + ", and the key of the TLS certificate is another key",
                 "--peer-cert other-client.pem");
+}
+
+TEST_F(CheckMessage, RequiresThatTheTokenIsSignedOnlyIfDemanded) {
+  const std::string message = Sign();
+  EXPECT_EQ(0, Check(message, "--require-signed-token").exitCode);
+  const std::string begin = "<ds:Reference URI=\"#" + Between(message, "#SAMLID\">", "<") + "\">";
+  const std::string end = "</ds:Reference>";
+  const std::size_t reference = message.rfind(begin);
+  ASSERT_NE(std::string::npos, reference);
+  m_folder.Write("template.xml", message.substr(0, reference) +
+                                     message.substr(message.find(end, reference) + end.size()));
+  const Result result = Run("xmlsec1 --sign --privkey-pem client.key --id-attr:Id Timestamp --id-attr:Id Body "
+                            "--node-xpath \"//*[local-name()='Security']/*[local-name()='Signature']\" template.xml");
+  ASSERT_EQ(0, result.exitCode) << result.err;
+  EXPECT_EQ(0, Check(result.out).exitCode);
+  ExpectRefused(result.out, 5, "message invalid", "The signature does not cover the token", "--require-signed-token");
 }
 
 TEST_F(CheckMessage, RefusesChangedMessages) {
@@ -245,7 +263,8 @@ TEST_F(CheckMessage, RefusesAWrongCommandLineAndMissingFiles) {
          "usage: --message-tolerance: must be a number from 0 to 86400; see ssoclient --help");
   expect("--trust sts.pem --part } envelope.xml", 2, "usage: --part must be {NAMESPACE}NAME, which '}' is not");
   expect("--trust sts.pem missing.xml", 7, "file: missing.xml: No such file or directory");
-  expect("--trust sts.pem --peer-cert missing.pem envelope.xml", 7, "file: missing.pem: No such file or directory");
+  expect("--trust sts.pem --peer-cert missing.pem envelope.xml", 7,
+         "file: Cannot open missing.pem: No such file or directory");
 }
 
 } // namespace

@@ -26,7 +26,8 @@ protected:
 
 TEST_F(DocumentedExamples, OfTheHelpRun) {
   Acquire("token.xml", PASSWORD);
-  for (const char *command : {"acquire", "token", "renew", "validate", "verify", "inspect", "sign", "check-message", "dialect"}) {
+  for (const char *command :
+       {"acquire", "token", "renew", "validate", "verify", "inspect", "sign", "check-message", "dialect"}) {
     const std::vector<std::string> examples = ExamplesOfHelp(command);
     EXPECT_FALSE(examples.empty()) << command;
     for (const std::string &example : examples) {

@@ -18,7 +18,8 @@ namespace {
 
 using testing::IsSupersetOf;
 
-const char *const COMMANDS[] = {"acquire", "token", "renew", "validate", "verify", "inspect", "sign", "check-message", "doctor", "dialect"};
+const char *const COMMANDS[] = {"acquire", "token", "renew",         "validate", "verify",
+                                "inspect", "sign",  "check-message", "doctor",   "dialect"};
 
 class EmptyValue : public testing::TestWithParam<const char *> {};
 

@@ -64,7 +64,8 @@ std::string TableIn(const std::string &text, const std::string &begin, const std
 
 TEST(Manual, ListsExactlyTheOptionsOfTheHelp) {
   std::set<std::string> helped;
-  for (const char *command : {"acquire", "token", "renew", "validate", "verify", "inspect", "sign", "check-message", "doctor", "dialect"}) {
+  for (const char *command :
+       {"acquire", "token", "renew", "validate", "verify", "inspect", "sign", "check-message", "doctor", "dialect"}) {
     helped.merge(OptionsOfHelp(command));
   }
   EXPECT_EQ(1u, helped.erase("--help"));

@@ -243,7 +243,8 @@ TEST(Tool, ListsItsCommandsAndExitCodesInTheHelp) {
   const Result result = RunTool({"--help"});
   EXPECT_EQ(0, result.exitCode);
   EXPECT_EQ("", result.err);
-  for (const char *command : {"acquire", "token", "renew", "validate", "verify", "inspect", "sign", "check-message", "doctor", "dialect"}) {
+  for (const char *command :
+       {"acquire", "token", "renew", "validate", "verify", "inspect", "sign", "check-message", "doctor", "dialect"}) {
     EXPECT_NE(std::string::npos, result.out.find(std::string("\n  ") + command + " ")) << command;
   }
   EXPECT_NE(std::string::npos, result.out.find(R"(Exit codes:

@@ -13,7 +13,7 @@ namespace {
 
 using namespace Testing;
 
-/// `<a DECLARATIONS><b BELOW/></a>`, and its inner element.
+/// An element "a" with an element "b", and these attributes.
 struct Sample {
   Sample(const std::string &declarations, const std::string &below)
       : document(ParseDocument("<a " + declarations + "><b " + below + "/></a>")),

@@ -104,7 +104,7 @@ TEST_F(ExistingSignaturesTest, MayCoverAHeaderForAnotherRole) {
 }
 
 TEST_F(ExistingSignaturesTest, AreRefusedWhenTheirReferencesDoNotResolveToOneElement) {
-  for (const char *const uri : {"#nothing", "#xpointer(/)", "#", "cid:part@example", "http://example/#b", "b"}) {
+  for (const char *const uri : {"#nothing", "#xpointer(/)", "#", "cid:part@example", "http://example/#b", "b", "xb"}) {
     EXPECT_TRUE(Refuses(SampleEnvelope("<s:Body Id=\"b\" id=\"nothing\">" +
                                        SignatureOver("URI=\"" + std::string(uri) + "\"") + "</s:Body>"),
                         MAY_COVER + "its reference \"" + uri + "\" does not refer to exactly one element"));
@@ -112,6 +112,8 @@ TEST_F(ExistingSignaturesTest, AreRefusedWhenTheirReferencesDoNotResolveToOneEle
   EXPECT_TRUE(
       Refuses(SampleEnvelope("<s:Body Id=\"b\"><x ID=\"b\"/><y Id=\"b\"/>" + SignatureOverId("b") + "</s:Body>"),
               MAY_COVER + "its reference \"#b\" does not refer to exactly one element"));
+  EXPECT_TRUE(Refuses(SampleEnvelope("<s:Body Id=\"\">" + SignatureOver("URI=\"cid:b\"") + "</s:Body>"),
+                      MAY_COVER + "its reference \"cid:b\" does not refer to exactly one element"));
   EXPECT_TRUE(Refuses(SampleEnvelope("<s:Body>" + SignatureOver("") + "</s:Body>"),
                       MAY_COVER + "it has a reference without a URI"));
 }

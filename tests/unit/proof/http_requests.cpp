@@ -3,6 +3,7 @@
 #include "unit/proof/http_requests.h"
 
 #include "support/data_file.h"
+#include "support/http_request_text.h"
 
 #include <tarvel/core/string_util.h>
 #include <tarvel/crypto/certificate.h>
@@ -18,29 +19,7 @@ using SsoClient::HttpRequest;
 const char *const HOLDER_THUMBPRINT = "4c983db50c7461335ac220c650af674cc8c1678a71ceb5e57c627783f369a4ce";
 
 HttpRequest ReadHttpRequest(const std::string &name) {
-  const std::string text = ReadDataFile("http/" + name + ".http");
-  const std::size_t end = text.find("\n\n");
-  std::istringstream head(text.substr(0, end));
-  HttpRequest request;
-  head >> request.method >> request.targetUri;
-  std::string line;
-  std::getline(head, line);
-  while (std::getline(head, line)) {
-    const std::size_t colon = line.find(": ");
-    request.headers.emplace_back(line.substr(0, colon), line.substr(colon + 2));
-  }
-  if (end + 2 < text.size()) {
-    request.body = text.substr(end + 2);
-  }
-  return request;
-}
-
-std::string WriteHttpRequest(const HttpRequest &request) {
-  std::string text = request.method + ' ' + request.targetUri + '\n';
-  for (const auto &[name, value] : request.headers) {
-    text.append(name).append(": ").append(value).append("\n");
-  }
-  return text + '\n' + request.body.value_or("");
+  return ParseHttpRequest(ReadDataFile("http/" + name + ".http"));
 }
 
 SsoClient::TokenVerifier HttpTokenVerifier(SsoClient::TokenProfile profile) {

@@ -22,9 +22,6 @@ extern const char *const HOLDER_THUMBPRINT;
 /// tests/data/crypto.
 SsoClient::HttpRequest ReadHttpRequest(const std::string &name);
 
-/// The request in the form of these files.
-std::string WriteHttpRequest(const SsoClient::HttpRequest &request);
-
 /// The verifier of the tokens in tests/data.
 SsoClient::TokenVerifier HttpTokenVerifier(SsoClient::TokenProfile profile = SsoClient::TokenProfile::STRICT);
 

@@ -4,6 +4,7 @@
 
 #include "support/data_file.h"
 #include "support/fixed_environment.h"
+#include "support/http_request_text.h"
 #include "support/throws_message.h"
 #include "support/token_stand_in.h"
 #include "support/work_folder.h"
@@ -101,20 +102,22 @@ struct Holder {
   const char *token;
 };
 
+constexpr Holder HOLDERS[] = {{"tokens/holder", "tokens/holder-of-key"},
+                              {"crypto/p256", "http/holder-p256"},
+                              {"crypto/p384", "http/holder-p384"}};
+
 TEST(SignHttpRequest, IsVerifiedByAProgramThatSharesNothingWithIt) {
-  for (const auto &[key, file] :
-       {Holder{"tokens/holder", "tokens/holder-of-key"}, Holder{"crypto/p256", "http/holder-p256"},
-        Holder{"crypto/p384", "http/holder-p384"}}) {
-    const std::string tokenFile = std::string(file) + ".xml";
+  for (const Holder &holder : HOLDERS) {
+    const std::string tokenFile = std::string(holder.token) + ".xml";
     const auto token = Testing::HttpTokenVerifier().Verify(ReadDataFile(tokenFile));
     HttpSigningOptions options;
     options.coveredHeaders = {"host"};
-    const HttpRequest request = With(POST_REQUEST, SignHttpRequest(POST_REQUEST, *token, *Key(key), options));
+    const HttpRequest request = With(POST_REQUEST, SignHttpRequest(POST_REQUEST, *token, *Key(holder.key), options));
     HttpRequest changed = request;
     changed.method = "PUT";
     const Testing::WorkFolder folder;
     const auto verify = [&](const std::string &text) {
-      const std::string command = "openssl pkey -pubout -in " + DataPath(std::string(key) + ".key") + " -out " +
+      const std::string command = "openssl pkey -pubout -in " + DataPath(std::string(holder.key) + ".key") + " -out " +
                                   folder / "key" + " && python3 -B " + DataPath("http/verify.py") + " " +
                                   folder.Write("request", text) + " " + folder / "key" + " " + DataPath(tokenFile) +
                                   " >" + folder / "log" + " 2>&1";
@@ -127,16 +130,14 @@ TEST(SignHttpRequest, IsVerifiedByAProgramThatSharesNothingWithIt) {
 }
 
 TEST(SignHttpRequest, IsAcceptedByVerifyHttpProof) {
-  for (const auto &[key, file] :
-       {Holder{"tokens/holder", "tokens/holder-of-key"}, Holder{"crypto/p256", "http/holder-p256"},
-        Holder{"crypto/p384", "http/holder-p384"}}) {
+  for (const Holder &holder : HOLDERS) {
     const TokenVerifier verifier = Testing::HttpTokenVerifier();
-    const auto token = verifier.Verify(ReadDataFile(std::string(file) + ".xml"));
+    const auto token = verifier.Verify(ReadDataFile(std::string(holder.token) + ".xml"));
     for (const boost::optional<std::string> &body :
          {boost::optional<std::string>(), boost::optional<std::string>("")}) {
       HttpRequest request{"PUT", "http://[::1]:8080", {}, body};
-      request = With(request, SignHttpRequest(request, *token, *Key(key)));
-      EXPECT_EQ(VerifyHttpProof(request, verifier).token->GetId(), token->GetId()) << key;
+      request = With(request, SignHttpRequest(request, *token, *Key(holder.key)));
+      EXPECT_EQ(VerifyHttpProof(request, verifier).token->GetId(), token->GetId()) << holder.key;
     }
   }
 }

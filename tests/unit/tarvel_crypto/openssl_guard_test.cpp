@@ -121,7 +121,7 @@ TEST(Passphrase, SuspendsTheGuardWhileItAsksTheHost) {
     EXPECT_FALSE(guard); // so that a clean-up does not wait for the user
     return std::string("x");
   };
-  Passphrase passphrase(ask, guard);
+  Passphrase passphrase(ask, guard, nullptr);
   EXPECT_EQ(passphrase.Get(), "x");
   EXPECT_TRUE(guard);
 }
@@ -130,7 +130,7 @@ TEST(Passphrase, ResumesTheGuardWhenTheHostThrows) {
   OpenSslGuard::Prepare();
   OpenSslGuard guard;
   const PassphraseCallback ask = []() -> std::string { throw InvalidArgumentException("no"); };
-  Passphrase passphrase(ask, guard);
+  Passphrase passphrase(ask, guard, nullptr);
   EXPECT_THROW(passphrase.Get(), InvalidArgumentException);
   EXPECT_TRUE(guard);
 }

@@ -69,7 +69,8 @@ final class EnvelopeJudge {
   String judgeAsTree(String envelope, Expected expected) {
     try {
       Document document = Xml.parse(envelope);
-      WSHandlerResult result = new WSSecurityEngine().processSecurityHeader(document, requestData(expected));
+      WSHandlerResult result = new WSSecurityEngine().processSecurityHeader(document,
+        requestData(trusted, passwordCallback(), expected.followsBasicSecurityProfile()));
       if (result == null) {
         return "no security header";
       }
@@ -83,35 +84,48 @@ final class EnvelopeJudge {
 
   /** Judges with the engine that reads a stream. */
   String judgeAsStream(String envelope, Expected expected) {
-    List<SecurityEvent> events = new ArrayList<>();
     try {
-      WSSSecurityProperties properties = new WSSSecurityProperties();
-      properties.setSignatureVerificationCrypto(trusted);
+      WSSSecurityProperties properties = properties(trusted, expected.followsBasicSecurityProfile());
       properties.setCallbackHandler(passwordCallback());
       properties.setUsernameTokenPasswordType(WSSConstants.UsernameTokenPasswordType.PASSWORD_TEXT);
-      properties.setRequireTimestampExpires(true);
-      properties.setValidateSamlSubjectConfirmation(true);
-      if (!expected.followsBasicSecurityProfile()) {
-        properties.addIgnoreBSPRule(BSPRule.R6617);
-      }
-      XMLStreamReader plain = XMLInputFactory.newInstance().createXMLStreamReader(
-        new ByteArrayInputStream(envelope.getBytes(StandardCharsets.UTF_8)));
-      XMLStreamReader reader = WSSec.getInboundWSSec(properties).processInMessage(plain, null, events::add);
-      while (reader.hasNext()) {
-        reader.next();
-      }
+      List<SecurityEvent> events = events(envelope, properties);
       return checkEvents(events, Xml.parse(envelope), expected);
     } catch (Exception failure) {
       return failure.getMessage() == null ? failure.toString() : failure.getMessage();
     }
   }
 
-  private RequestData requestData(Expected expected) {
+  /** How strictly the stream engine judges every message. */
+  static WSSSecurityProperties properties(Merlin trusted, boolean followsBasicSecurityProfile) throws Exception {
+    WSSSecurityProperties properties = new WSSSecurityProperties();
+    properties.setSignatureVerificationCrypto(trusted);
+    properties.setRequireTimestampExpires(true);
+    properties.setValidateSamlSubjectConfirmation(true);
+    if (!followsBasicSecurityProfile) {
+      properties.addIgnoreBSPRule(BSPRule.R6617);
+    }
+    return properties;
+  }
+
+  /** What the stream engine reports of a message that it accepts. */
+  static List<SecurityEvent> events(String envelope, WSSSecurityProperties properties) throws Exception {
+    List<SecurityEvent> events = new ArrayList<>();
+    XMLStreamReader plain = XMLInputFactory.newInstance().createXMLStreamReader(
+      new ByteArrayInputStream(envelope.getBytes(StandardCharsets.UTF_8)));
+    XMLStreamReader reader = WSSec.getInboundWSSec(properties).processInMessage(plain, null, events::add);
+    while (reader.hasNext()) {
+      reader.next();
+    }
+    return events;
+  }
+
+  /** How strictly the tree engine judges every message. */
+  static RequestData requestData(Merlin trusted, CallbackHandler passwords, boolean followsBasicSecurityProfile) {
     RequestData data = new RequestData();
     data.setWssConfig(WSSConfig.getNewInstance());
     data.setSigVerCrypto(trusted);
-    data.setCallbackHandler(passwordCallback());
-    data.setDisableBSPEnforcement(!expected.followsBasicSecurityProfile());
+    data.setCallbackHandler(passwords);
+    data.setDisableBSPEnforcement(!followsBasicSecurityProfile);
     data.setRequiredPasswordType(WSConstants.PASSWORD_TEXT);
     data.setRequireTimestampExpires(true);
     data.setValidateSamlSubjectConfirmation(true);
@@ -164,18 +178,24 @@ final class EnvelopeJudge {
       return signatures.size() + " message signatures";
     }
     for (WSSecurityEngineResult signature : signatures) {
-      Set<Element> wanted = mustBeSigned(document);
-      Set<Element> signed = Collections.newSetFromMap(new IdentityHashMap<>());
-      @SuppressWarnings("unchecked")
-      List<WSDataRef> references = (List<WSDataRef>) signature.get(WSSecurityEngineResult.TAG_DATA_REF_URIS);
-      for (WSDataRef reference : references) {
-        signed.add(reference.getProtectedElement());
-      }
-      if (references.size() != wanted.size() || !signed.equals(wanted)) {
-        return "other elements are signed: " + names(signed) + ", wanted: " + names(wanted);
+      String answer = checkSigned(signature, mustBeSigned(document));
+      if (!answer.equals(VERIFIES)) {
+        return answer;
       }
     }
     return VERIFIES;
+  }
+
+  /** Whether a signature covers exactly the wanted elements, by identity. */
+  static String checkSigned(WSSecurityEngineResult signature, Set<Element> wanted) {
+    Set<Element> signed = Collections.newSetFromMap(new IdentityHashMap<>());
+    @SuppressWarnings("unchecked")
+    List<WSDataRef> references = (List<WSDataRef>) signature.get(WSSecurityEngineResult.TAG_DATA_REF_URIS);
+    for (WSDataRef reference : references) {
+      signed.add(reference.getProtectedElement());
+    }
+    return references.size() == wanted.size() && signed.equals(wanted) ? VERIFIES
+      : "other elements are signed: " + names(signed) + ", wanted: " + names(wanted);
   }
 
   private static String names(Set<Element> elements) {
@@ -183,29 +203,34 @@ final class EnvelopeJudge {
   }
 
   private static String checkEvents(List<SecurityEvent> events, Document document, Expected expected) {
-    boolean hasUsername = false;
-    int signatures = 0;
+    boolean hasUsername = events.stream()
+      .anyMatch(event -> event.getSecurityEventType() == WSSecurityEventConstants.USERNAME_TOKEN);
+    if (hasUsername != expected.hasUsername()) {
+      return "not the expected username token";
+    }
+    return checkSigned(events, expected.isSigned() ? mustBeSigned(document) : Set.of());
+  }
+
+  /** Whether exactly the wanted elements are signed, by their paths; if none is wanted, there is no signature. */
+  static String checkSigned(List<SecurityEvent> events, Set<Element> wantedElements) {
+    boolean hasSignature = false;
     Set<String> signed = new TreeSet<>();
     for (SecurityEvent event : events) {
-      hasUsername = hasUsername || event.getSecurityEventType() == WSSecurityEventConstants.USERNAME_TOKEN;
-      signatures += event instanceof SignatureValueSecurityEvent ? 1 : 0;
+      hasSignature = hasSignature || event instanceof SignatureValueSecurityEvent;
       boolean isPart = event instanceof SignedPartSecurityEvent part && part.isSigned();
       boolean isElement = event instanceof SignedElementSecurityEvent element && element.isSigned();
       if (isPart || isElement) {
         signed.add(path(((AbstractElementSecurityEvent) event).getElementPath()));
       }
     }
-    if (hasUsername != expected.hasUsername()) {
-      return "not the expected username token";
-    }
-    if (!expected.isSigned()) {
+    if (wantedElements.isEmpty()) {
       return signed.isEmpty() ? VERIFIES : "signed: " + signed;
     }
     Set<String> wanted = new TreeSet<>();
-    for (Element element : mustBeSigned(document)) {
+    for (Element element : wantedElements) {
       wanted.add(path(element));
     }
-    return signatures > 0 && signed.equals(wanted) ? VERIFIES
+    return hasSignature && signed.equals(wanted) ? VERIFIES
       : "other elements are signed: " + signed + ", wanted: " + wanted;
   }
 

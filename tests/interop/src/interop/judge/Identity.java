@@ -15,8 +15,8 @@ import java.util.ArrayList;
 import java.util.Base64;
 import java.util.List;
 
-/** A private key and its certificate, and the file of the certificate. */
-record Identity(PrivateKey key, X509Certificate certificate, Path certificateFile) {
+/** A private key and its certificate, and their files. */
+record Identity(PrivateKey key, X509Certificate certificate, Path keyFile, Path certificateFile) {
   /** Makes an identity with openssl. `newKey` is the key, as arguments of "openssl req -newkey". */
   static Identity make(Path folder, String name, String... newKey) throws Exception {
     Path keyFile = folder.resolve(name + ".key");
@@ -36,7 +36,8 @@ record Identity(PrivateKey key, X509Certificate certificate, Path certificateFil
     PKCS8EncodedKeySpec encoded = new PKCS8EncodedKeySpec(Base64.getMimeDecoder().decode(pem));
     X509Certificate certificate = certificate(certificateFile);
     String algorithm = certificate.getPublicKey().getAlgorithm();
-    return new Identity(KeyFactory.getInstance(algorithm).generatePrivate(encoded), certificate, certificateFile);
+    return new Identity(KeyFactory.getInstance(algorithm).generatePrivate(encoded), certificate, keyFile,
+      certificateFile);
   }
 
   static X509Certificate certificate(Path file) throws IOException, GeneralSecurityException {

@@ -53,8 +53,17 @@ public final class Judge {
       }
       tokens.judgeForeign(foreign);
       tokens.judgeMade();
+      MessageParties parties = new MessageParties(service, requests.tokens().get("issue by certificate"), tool, folder);
+      // The certificates of those that hold tokens are not trusted: only the tokens prove whose keys they are.
+      KeyStore trustedByServices = trustStore(signing);
+      parties.trust(trustedByServices);
+      MessageJudge messageJudge = new MessageJudge(trustedByServices);
+      MessageJudgement messages = new MessageJudgement(verdicts, messageJudge, parties.maker(), parties.issuers(), tool,
+        folder);
+      messages.run();
       verdicts.disagreements().forEach(line -> System.err.println("judge: " + line));
-      selfChecks = SelfCheck.run(judge, requests.anySignedRequest(), requests.tokens(), signing);
+      selfChecks = SelfCheck.run(judge, requests.anySignedRequest(), requests.tokens(), signing)
+        + SelfCheck.runMessages(messageJudge, messages, new XmlsecJudge(folder), signing);
     }
     Files.writeString(Path.of(arguments[3]), verdicts.markdown());
     System.out.println("judge: " + verdicts.size() + " answers, " + verdicts.disagreements().size()

@@ -11,6 +11,8 @@ import org.opensaml.core.xml.config.XMLObjectProviderRegistrySupport;
 import org.opensaml.saml.common.SAMLObjectContentReference;
 import org.opensaml.saml.saml2.core.Assertion;
 import org.opensaml.security.x509.BasicX509Credential;
+import org.opensaml.xmlsec.keyinfo.KeyInfoSupport;
+import org.opensaml.xmlsec.signature.KeyInfo;
 import org.opensaml.xmlsec.signature.Signature;
 import org.opensaml.xmlsec.signature.support.SignatureConstants;
 import org.opensaml.xmlsec.signature.support.Signer;
@@ -25,13 +27,25 @@ final class TokenMaker {
   private TokenMaker() {
   }
 
-  /** Signs with OpenSAML. */
+  /** Signs with OpenSAML, without a KeyInfo. */
   static String signByOpenSaml(TokenKinds.Kind kind, Identity issuer) throws Exception {
+    return signByOpenSaml(kind, issuer, null);
+  }
+
+  /** Signs with OpenSAML; the KeyInfo has the issuer's certificate. WSS4J reads no token without a KeyInfo. */
+  static String signWithCertificate(TokenKinds.Kind kind, Identity issuer) throws Exception {
+    KeyInfo keyInfo = SamlObjects.make(KeyInfo.DEFAULT_ELEMENT_NAME);
+    KeyInfoSupport.addCertificate(keyInfo, issuer.certificate());
+    return signByOpenSaml(kind, issuer, keyInfo);
+  }
+
+  private static String signByOpenSaml(TokenKinds.Kind kind, Identity issuer, KeyInfo keyInfo) throws Exception {
     BasicX509Credential credential = new BasicX509Credential(issuer.certificate(), issuer.key());
     Signature signature = SamlObjects.make(Signature.DEFAULT_ELEMENT_NAME);
     signature.setSigningCredential(credential);
     signature.setSignatureAlgorithm(SignatureConstants.ALGO_ID_SIGNATURE_RSA_SHA256);
     signature.setCanonicalizationAlgorithm(SignatureConstants.ALGO_ID_C14N_EXCL_OMIT_COMMENTS);
+    signature.setKeyInfo(keyInfo);
     Assertion assertion = kind.assertion();
     assertion.setSignature(signature);
     ((SAMLObjectContentReference) signature.getContentReferences().get(0))

@@ -37,6 +37,13 @@ final class Verdicts {
     return "**" + found + "**, expected " + expected;
   }
 
+  /** Adds the rows and answers of another one. */
+  void add(Verdicts other) {
+    lines.addAll(other.lines);
+    size += other.size;
+    disagreements.addAll(other.disagreements);
+  }
+
   /** How many answers were checked. */
   int size() {
     return size;

@@ -22,6 +22,7 @@ import org.xml.sax.SAXException;
 /** XML as text and as a tree. */
 final class Xml {
   static final String SOAP = "http://schemas.xmlsoap.org/soap/envelope/";
+  static final String SOAP12 = "http://www.w3.org/2003/05/soap-envelope";
   static final String WSSE = "http://docs.oasis-open.org/wss/2004/01/oasis-200401-wss-wssecurity-secext-1.0.xsd";
   static final String WSU = "http://docs.oasis-open.org/wss/2004/01/oasis-200401-wss-wssecurity-utility-1.0.xsd";
   static final String DS = "http://www.w3.org/2000/09/xmldsig#";
