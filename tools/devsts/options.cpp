@@ -49,6 +49,12 @@ Fault RequireFault(const std::string &name) {
   return *fault;
 }
 
+void AddEchoOptions(CLI::App &app, Options &options) {
+  app.add_flag("--echo-bearer", options.acceptsBearer, "The echo service accepts bearer tokens, too");
+  app.add_flag("--client-certificates", options.asksForCertificates,
+               "Ask clients for a TLS certificate; the echo service accepts that of the token as proof");
+}
+
 } // namespace
 
 std::variant<Options, int> ReadOptions(int argc, char **argv) {
@@ -74,9 +80,7 @@ std::variant<Options, int> ReadOptions(int argc, char **argv) {
   app.add_option("--tolerance", tolerance, "How far clocks may differ, in seconds")
       ->capture_default_str()
       ->check(CLI::Range(0, LONGEST_TOLERANCE));
-  app.add_flag("--echo-bearer", options.acceptsBearer, "The echo service accepts bearer tokens, too");
-  app.add_flag("--client-certificates", options.asksForCertificates,
-               "Ask clients for a TLS certificate; the echo service accepts that of the token as proof");
+  AddEchoOptions(app, options);
   app.add_flag("--until-eof", options.untilEof, "End when standard input ends");
   try {
     app.parse(argc, argv);

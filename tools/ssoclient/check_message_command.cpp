@@ -34,6 +34,7 @@ struct CheckMessageOptions {
   MessagePartsOptions message;
   bool acceptsBearer = false;
   bool acceptsNoTimestamp = false;
+  bool requiresSignedToken = false;
   std::string peerCertificateFile;
   std::int64_t messageToleranceSec = MessageVerifierOptions().clockToleranceSec;
   std::int64_t maxAgeSec = MessageVerifierOptions().maxAgeSec;
@@ -47,6 +48,7 @@ MessageVerifierOptions DemandsOf(const CheckMessageOptions &options) {
   demands.requiredParts = ParseParts(options.message.parts);
   demands.acceptBearer = options.acceptsBearer;
   demands.requireTimestamp = !options.acceptsNoTimestamp;
+  demands.requireTokenCovered = options.requiresSignedToken;
   demands.clockToleranceSec = options.messageToleranceSec;
   demands.maxAgeSec = options.maxAgeSec;
   return demands;
@@ -122,6 +124,9 @@ void AddDemands(CLI::App &app, CheckMessageOptions &options) {
       .Group(GROUP);
   AddFlag(app, "--allow-bearer", options.acceptsBearer, "Accept a bearer token, which proves nothing").Group(GROUP);
   AddFlag(app, "--allow-no-timestamp", options.acceptsNoTimestamp, "Accept a message without a timestamp").Group(GROUP);
+  AddFlag(app, "--require-signed-token", options.requiresSignedToken,
+          "Refuse a message whose signature does not cover the token")
+      .Group(GROUP);
   AddOption(app, "--peer-cert", options.peerCertificateFile,
             "Certificate with which the sender authenticated in TLS, PEM or DER; of a chain, the first")
       .TypeName("FILE")

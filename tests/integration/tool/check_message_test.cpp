@@ -107,6 +107,22 @@ TEST_F(CheckMessage, AcceptsTheCertificateOfTheTlsConnectionAsProof) {
                 "--peer-cert other-client.pem");
 }
 
+TEST_F(CheckMessage, RequiresThatTheTokenIsSignedOnlyIfDemanded) {
+  const std::string message = Sign();
+  EXPECT_EQ(0, Check(message, "--require-signed-token").exitCode);
+  const std::string begin = "<ds:Reference URI=\"#" + Between(message, "#SAMLID\">", "<") + "\">";
+  const std::string end = "</ds:Reference>";
+  const std::size_t reference = message.rfind(begin);
+  ASSERT_NE(std::string::npos, reference);
+  m_folder.Write("template.xml", message.substr(0, reference) +
+                                     message.substr(message.find(end, reference) + end.size()));
+  const Result result = Run("xmlsec1 --sign --privkey-pem client.key --id-attr:Id Timestamp --id-attr:Id Body "
+                            "--node-xpath \"//*[local-name()='Security']/*[local-name()='Signature']\" template.xml");
+  ASSERT_EQ(0, result.exitCode) << result.err;
+  EXPECT_EQ(0, Check(result.out).exitCode);
+  ExpectRefused(result.out, 5, "message invalid", "The signature does not cover the token", "--require-signed-token");
+}
+
 TEST_F(CheckMessage, RefusesChangedMessages) {
   const std::string message = Sign();
   ExpectRefused(Replaced(message, ">7<", ">8<"), 6, "proof invalid", WRONG_SIGNATURE);

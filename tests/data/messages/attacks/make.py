@@ -384,6 +384,8 @@ def proofs():
     refuse('another-key-in-binary-token', change(GENUINE, PROOF, sign_other(GENUINE)), UNSIGNED, proof)
     refuse('signature-in-body', change(change(GENUINE, PROOF, ''), BODY, BODY + PROOF), UNSIGNED, proof)
     refuse('signature-nested', change(GENUINE, PROOF, f'<x>{PROOF}</x>'), UNSIGNED, proof)
+    refuse('certificate-and-broken-key-value', message(key_info=x509_data() + change(key_value(), '<ds:Modulus>',
+                                                                                     '<ds:Modulus>!')), UNSIGNED, proof)
     refuse('no-key-info', message(key_info=False), UNSIGNED, proof)
     refuse('key-info-empty', change(GENUINE, cut(PROOF, '<ds:KeyInfo>', '</ds:KeyInfo>'), '<ds:KeyInfo/>'), UNSIGNED,
            proof)

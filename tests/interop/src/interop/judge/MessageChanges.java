@@ -22,7 +22,7 @@ final class MessageChanges {
   private MessageChanges() {
   }
 
-  /** The changed copies, each under the name of the change. `otherToken` is of the same service, and has another key. */
+  /** The changed copies, each under the name of the change. `otherToken` is the service's, too, for another key. */
   static Map<String, String> of(String message, String role, boolean isSigned, String otherToken) throws Exception {
     Map<String, Change> changes = new LinkedHashMap<>();
     addForms(changes, otherToken);

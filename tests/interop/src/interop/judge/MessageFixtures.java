@@ -59,7 +59,8 @@ public final class MessageFixtures {
 
   /** xmlsec1 1.2.37 has neither RSA-PSS nor the transform of WS-Security. */
   private static boolean xmlsec1Reads(MessageKinds.Kind kind) {
-    return kind.isSigned() && kind.extra() != MessageKinds.Extra.OTHER_KEY && !kind.algorithm().equals(MessageKinds.RSA_PSS_SHA256)
+    return kind.isSigned() && kind.extra() != MessageKinds.Extra.OTHER_KEY
+      && !kind.algorithm().equals(MessageKinds.RSA_PSS_SHA256)
       && !kind.refusal().equals(MessageKinds.TRANSFORM);
   }
 

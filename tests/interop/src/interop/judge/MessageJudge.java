@@ -23,12 +23,12 @@ import org.w3c.dom.Document;
 import org.w3c.dom.Element;
 import org.w3c.dom.Node;
 
-/** Judges a message with a token as a service does, with both engines of WSS4J, and then checks what exactly is signed. */
+/** Judges a message with a token as a service does, with both engines of WSS4J, and then checks what is signed. */
 final class MessageJudge {
   /**
-   * What a message must have. An empty `role` is that of the last receiver. `covered` has the local names of the elements
-   * that are signed with the token's key, and of no other; it is empty for a bearer token. `others` is the number of
-   * other signatures.
+   * What a message must have. An empty `role` is that of the last receiver. `covered` has the local names of the
+   * elements that are signed with the token's key, and of no other; it is empty for a bearer token. `others` is the
+   * number of other signatures.
    */
   record Expected(String role, List<String> covered, int others, boolean followsBasicSecurityProfile) {
     /** Of a message that the tool makes. It always signs the token, too. */

@@ -11,7 +11,7 @@ import java.util.concurrent.ExecutorService;
 import java.util.concurrent.Executors;
 import java.util.concurrent.Future;
 
-/** Judges messages with tokens in both directions: WSS4J and xmlsec1 verify the tool's, and the tool verifies WSS4J's. */
+/** Judges messages with tokens: WSS4J and xmlsec1 verify the tool's messages, and the tool verifies WSS4J's. */
 final class MessageJudgement {
   private interface Judgement {
     void judge(MessageKinds.Kind kind, Verdicts verdicts, Path folder) throws Exception;

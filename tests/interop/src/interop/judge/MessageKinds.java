@@ -27,7 +27,7 @@ final class MessageKinds {
     TOKEN_BY_ID,
     /** The token, by the transform that WS-Security defines for references to tokens. */
     TOKEN_BY_REFERENCE,
-    /** A signature with another certificate, over the same parts; in a message that the tool signs, over the timestamp. */
+    /** Another certificate signs the same parts, too; in a message that the tool signs, it signs the timestamp. */
     OTHER_SIGNATURE,
     /** The header "urn:orders" Priority, which is in every message. */
     HEADER,

@@ -25,12 +25,12 @@ import org.apache.wss4j.dom.saml.WSSecSignatureSAML;
 import org.w3c.dom.Document;
 
 /**
- * Measures how long WSS4J takes to sign a message with the key of a token, and to verify it, each from text to text. The
- * body, the timestamp and the token are signed.
+ * Measures how long WSS4J takes to sign a message with the key of a token, and to verify it, each from text to text.
+ * The body, the timestamp and the token are signed.
  *
  * usage: MessageSpeed TOKEN KEY CERTIFICATE ISSUER-CERTIFICATE ENVELOPE
- * For each line of standard input, it measures, and writes a line: the medians for signing and verifying, in microseconds
- * of processor time of the thread, without the garbage collector's.
+ * For each line of standard input, it measures, and writes a line: the medians for signing and verifying, in
+ * microseconds of processor time of the thread, without the garbage collector's.
  * What can be reused is prepared before: the token, the key, and the trust store.
  */
 public final class MessageSpeed {
