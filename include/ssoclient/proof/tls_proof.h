@@ -13,7 +13,7 @@ namespace SsoClient {
 
 /// Checks that the sender of a holder-of-key token has its key: the key of `peerCertificate`, with which the sender
 /// authenticated in the TLS handshake, is the key of the token. The keys are compared, not the certificates, so neither dates
-/// nor issuer of `peerCertificate` matter here. Safe on any thread.
+/// nor issuer of `peerCertificate` matter here. How strong the key must be is decided by the TLS server. Safe on any thread.
 /// @param token a token that is verified; made by this library, or with a certificate
 /// @param peerCertificate from the handshake that is complete, and not from a header that a sender can write
 /// @throws InvalidProofException when it is another key.

@@ -32,7 +32,7 @@ Place &PlaceOf(const std::uint8_t *data, std::size_t length) noexcept {
 
 Ref<const Certificate> Take(Place &place) noexcept {
   const Certificate *const certificate = place.exchange(nullptr, std::memory_order_acquire);
-  const Ref<const Certificate> taken(certificate);
+  Ref<const Certificate> taken(certificate);
   if (certificate) {
     certificate->Release(); // the reference of the place; `taken` has another one
   }
