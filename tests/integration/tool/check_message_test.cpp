@@ -114,8 +114,8 @@ TEST_F(CheckMessage, RequiresThatTheTokenIsSignedOnlyIfDemanded) {
   const std::string end = "</ds:Reference>";
   const std::size_t reference = message.rfind(begin);
   ASSERT_NE(std::string::npos, reference);
-  m_folder.Write("template.xml", message.substr(0, reference) +
-                                     message.substr(message.find(end, reference) + end.size()));
+  m_folder.Write("template.xml",
+                 message.substr(0, reference) + message.substr(message.find(end, reference) + end.size()));
   const Result result = Run("xmlsec1 --sign --privkey-pem client.key --id-attr:Id Timestamp --id-attr:Id Body "
                             "--node-xpath \"//*[local-name()='Security']/*[local-name()='Signature']\" template.xml");
   ASSERT_EQ(0, result.exitCode) << result.err;
