@@ -16,7 +16,7 @@ namespace SsoClient {
 enum class KeyReferral : std::uint8_t {
   NOTHING,     ///< there is no reference
   TOKEN,       ///< the token, by its identifier or by its key
-  OTHER_TOKEN, ///< another SAML token, or the same one as a token of another type
+  OTHER_TOKEN, ///< another SAML token, or this token with a wrong token type
   OTHER_KEY,   ///< something else, such as a certificate with another key
   SEVERAL      ///< the token and something else
 };

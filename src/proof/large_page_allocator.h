@@ -13,9 +13,9 @@
 
 namespace SsoClient {
 
-/// Asks the kernel for large pages, where a whole one has a place in the array. Otherwise, nearly each read of a random place also
-/// waits for the processor to find the page, which takes as long as the read itself. Without large pages, the array works the
-/// same.
+/// Asks the kernel for large pages, for the part of the array that consists of whole ones. With small pages, nearly
+/// every read of a random place also waits until the processor has found the page, which takes as long as the read
+/// itself. If the kernel has no large pages, the array is only slower.
 template <typename T>
 class LargePageAllocator {
 public:
@@ -43,7 +43,7 @@ public:
   }
 
 private:
-  // Only a wish: a failure changes nothing.
+  // A failure is ignored: the array keeps its small pages.
   static void AskForLargePages(std::uintptr_t memory, std::size_t bytes) noexcept {
     constexpr std::uintptr_t LARGE_PAGE_BYTES = std::uintptr_t{2} << 20;
     const std::uintptr_t offset = (LARGE_PAGE_BYTES - memory % LARGE_PAGE_BYTES) % LARGE_PAGE_BYTES;

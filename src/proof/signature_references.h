@@ -27,7 +27,8 @@ void ForEachPrefix(std::string_view prefixList, const Function &function) {
   }
 }
 
-/// A canonical form, and how it depends on declarations of the elements around its apex.
+/// A canonical form, and how it depends on declarations of the elements around its apex, which is its outermost
+/// element.
 struct ContextOfForm {
   bool isInclusive = false;    ///< it contains every declaration in scope
   std::string_view prefixList; ///< it contains the declarations of these prefixes, separated by white space

@@ -40,16 +40,16 @@ struct SoapEnvelope {
   EnvelopeFault fault = EnvelopeFault::NONE;         ///< the first fault in document order
   const Tarvel::Xml::Node *place = nullptr;          ///< of the fault: the node that should not be there, or the
                                                      ///< envelope; null if there is no document element
-  SoapVersion version = SoapVersion::SOAP11;         ///< valid unless the fault is one of the first two
+  SoapVersion version = SoapVersion::SOAP11;         ///< not set if the fault is NOT_AN_ENVELOPE or OTHER_VERSION
   const Tarvel::Xml::ElementNode *element = nullptr; ///< the document element; may be null
   const Tarvel::Xml::ElementNode *header = nullptr;  ///< the first header; null if there is none
   const Tarvel::Xml::ElementNode *body = nullptr;    ///< the first body; null if there is none
 };
 
-/// The envelope that `element`, a document element, is. Null is not an envelope.
+/// Reads `element`, the document element, as an envelope. Null is not an envelope.
 SoapEnvelope ReadEnvelope(const Tarvel::Xml::ElementNode *element) noexcept;
 
-/// The elements that a search has found, in document order. At most one is right for every search here.
+/// The first two elements that a search has found, in document order. Every search here expects at most one.
 struct FoundElements {
   const Tarvel::Xml::ElementNode *first = nullptr;  ///< null if there is none
   const Tarvel::Xml::ElementNode *second = nullptr; ///< null if there is at most one

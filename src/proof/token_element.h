@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// `TokenElement`, the assertion of a token that is added to a message of others.
+/// `TokenElement`, the assertion of a token that is added to the caller's message.
 
 #pragma once
 
@@ -30,7 +30,8 @@ public:
 
   /// Prepares the assertion for becoming a child of `parent`: its names without a prefix stay in the namespace in which they
   /// are. `parent` does not change.
-  /// @throws InvalidMessageException when the token's signature includes a prefix that is declared at `parent`.
+  /// @throws InvalidMessageException when the token's signature includes a prefix that is declared in scope of
+  ///         `parent`, and not in the token.
   void PrepareFor(const Tarvel::Xml::ElementNode &parent) const;
 
 private:

@@ -33,13 +33,13 @@ struct HttpRequest {
   /// appear several times.
   std::vector<std::pair<std::string, std::string>> headers;
 
-  /// The octets of the content, after transfer codings are removed and before content codings are; unset for a request
-  /// without content.
+  /// The octets of the content: without transfer codings, and still with content codings, such as gzip. Unset for a
+  /// request without content.
   boost::optional<std::string> body;
 };
 
-/// How the token is written into a header field. Client and service must agree on it: there is no standard for it. If the field
-/// is Authorization, "SAML" is not a registered scheme, and the scheme's letter case matters.
+/// How the token is written into a header field. Client and service must agree on it: there is no standard for it.
+/// "SAML", the default scheme in Authorization, is not registered, and its letter case matters.
 struct TokenHeader {
   /// How the octets of the token become text.
   enum class Encoding : std::int32_t {

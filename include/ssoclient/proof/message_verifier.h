@@ -33,7 +33,7 @@ struct MessageVerifierOptions {
   boost::optional<std::string> role;
 
   /// The header blocks that must be covered by the signature, in addition to the body and the timestamp. Each must be there
-  /// exactly once. Nothing is covered without a signature: then they only must be there.
+  /// exactly once. Without a signature nothing is covered, so only their presence is checked.
   std::vector<MessagePart> requiredParts;
 
   /// Whether the signature must cover the token. Set it if all senders sign the token, as `SignMessage` does. Without it, an
@@ -60,9 +60,10 @@ struct MessageVerifierOptions {
 
 /// An accepted message. Read the message from here, and from nowhere else: what was verified is what this tree contains.
 ///
-/// The token is verified. If the proof is MESSAGE_SIGNATURE, the covered elements are what the sender signed; nothing else
-/// in the message is. Comments are not signed, so ignore them: a text with a comment in between is one text. For other
-/// proofs nothing in the message is signed, and the message has the trust of the connection on which it was received.
+/// The token is verified. If the proof is MESSAGE_SIGNATURE, the covered elements are what the sender signed; nothing
+/// else in the message was signed. Comments are not signed, so ignore them: a text with a comment in between is one
+/// text. With another proof nothing in the message is signed, so trust the message only as far as the connection that
+/// delivered it.
 struct VerifiedMessage {
   /// An element that the signature covers.
   struct CoveredElement {
@@ -82,7 +83,7 @@ struct VerifiedMessage {
   ReplayProtection replay = ReplayProtection::NOT_GUARDED; ///< whether a replay guard has accepted the message
 
   /// Whether `element`, which must be of `document`, is one of the covered elements or inside one of them, and not in the
-  /// signature that it omits.
+  /// signature that the covered element omits.
   SSOCLIENT_API bool IsCovered(const Tarvel::Xml::ElementNode &element) const noexcept;
 };
 
@@ -90,9 +91,9 @@ struct VerifiedMessage {
 /// use one verifier at once. Copies share everything.
 ///
 /// The header must have exactly one token, and may have one signature that refers to it: by the SAML identifier
-/// (SAML Token Profile 1.1, section 3.4), or with the token's key in its `ds:KeyInfo`. This signature is verified with the
-/// token's key, whatever its `ds:KeyInfo` contains, in the profile of `Tarvel::Xml::Security::Signature`. Signatures by
-/// other keys are ignored and prove nothing.
+/// (SAML Token Profile 1.1, section 3.4), or with the token's key in its `ds:KeyInfo`. This signature is always
+/// verified with the token's key, by the profile of `Tarvel::Xml::Security::Signature`. Signatures by other keys are
+/// ignored and prove nothing. A header with more than 10 signatures is refused.
 class SSOCLIENT_API MessageVerifier {
 public:
   /// @param tokens verifies the tokens; shares its prepared keys
@@ -105,13 +106,14 @@ public:
   ~MessageVerifier() = default;
 
   /// Verifies a message from a stranger: its form, the time, the token, the proof of the token's key, that the required
-  /// parts are the elements that a reader of the message finds, and that they are covered; at last, if it is signed, it asks
-  /// the replay guard. The exception is for the first of these that fails.
+  /// parts are the elements that a reader of the message finds, and that they are covered. If the message is signed,
+  /// the replay guard is asked last. The exception is for the first of these checks that fails.
   /// @throws Tarvel::Xml::XMLParseException when the text is not a well-formed document.
-  /// @throws InvalidMessageException when it is not an envelope with one body; when it does not have exactly one security
-  ///         header for the role, with one token and at most one timestamp that can be read; when a signature in that header
-  ///         refers to another token, or two refer to the token; when the token has no canonical form; and when a
-  ///         required part is missing, is there twice or is not covered.
+  /// @throws InvalidMessageException when it is not an envelope with one body; when it does not have exactly one
+  ///         security header for the role, with one token and at most one timestamp that can be read; when a signature
+  ///         in that header refers to another token, or to the token and something else; when two signatures refer to
+  ///         the token, or there are more than 10; when the token has no canonical form; and when a required part is
+  ///         missing, is there twice or is not covered.
   /// @throws StaleMessageException when the timestamp is in the future, has expired or is too old.
   /// @throws ParseException and InvalidSignatureException, for the token, like `TokenVerifier::Verify`.
   /// @throws InvalidProofException when the token's key did not sign the message and the sender did not authenticate with
@@ -123,8 +125,8 @@ public:
   ///         Like a ReplayGuardException they say nothing about the message.
   VerifiedMessage Verify(const std::string &message) const;
 
-  /// The same for a sender that may have authenticated in TLS. If the message is signed with the token's key, the
-  /// certificate is not considered: the signature must be right.
+  /// The same for a sender that may have authenticated in TLS. If a signature refers to the token, that signature must
+  /// be valid, and the certificate is not considered.
   /// @param peerCertificate the certificate with which the sender authenticated, after the handshake; or null
   /// @throws Tarvel::TypeMismatchException for a certificate that this library has not made.
   VerifiedMessage Verify(const std::string &message, const Tarvel::Crypto::Certificate *peerCertificate) const;

@@ -28,9 +28,10 @@ public:
     UNAVAILABLE ///< the guard is full or cannot be reached; the message is not remembered
   };
 
-  /// Remembers the message, at least until `until`, and answers whether it was known. Both happen in one step: of several
-  /// calls with one identifier at the same time, one is answered FIRST. It may block, for example on the network.
-  /// What it throws is reported as UNAVAILABLE.
+  /// Remembers the message, at least until `until`, and answers whether it was known. Both happen in one step: of
+  /// several calls with one identifier at the same time, at most one is answered FIRST. The function may block, for
+  /// example on the network. If it throws, the message is refused by a `ReplayGuardException`, like after
+  /// UNAVAILABLE.
   virtual Answer Remember(const MessageIdentifier &identifier, const Tarvel::System::DateTime &until) = 0;
 
 protected:
@@ -50,8 +51,9 @@ constexpr std::size_t MAX_MEMORY_REPLAY_GUARD_CAPACITY = 100'000'000;
 /// It uses at most 56 bytes for each message of `capacity` and less than 1 KiB in addition, all of them from the beginning. A
 /// call never waits for many messages that expire at once.
 ///
-/// The clock is that of the machine. The guard also answers UNAVAILABLE, and remembers nothing, if `until` is not in the
-/// future. After the clock was set back, it does the same up to the latest `until` of a message that it has removed. So of all
+/// The clock is that of the machine. The guard also answers UNAVAILABLE to a message that it does not know, and
+/// remembers nothing, if `until` is not in the future. After the clock was set back, it does the same if `until` is not
+/// later than the latest `until` of the messages that it has removed, because the message may be one of them. So of all
 /// calls with one identifier and one `until`, only one is ever answered FIRST, even if the clock changes.
 ///
 /// A child made by `fork` gets a copy of the guard. After that, parent and child do not know each other's messages.

@@ -43,8 +43,8 @@ struct HttpSigningOptions {
 /// SubjectPublicKeyInfo, as 64 hexadecimal digits) and `alg`. The key decides the algorithm: rsa-v1_5-sha256 for an RSA key,
 /// ecdsa-p256-sha256 and ecdsa-p384-sha384 for an EC key on P-256 and P-384.
 ///
-/// Nothing in the result is secret, but the request can be sent again by anyone who reads it, until it is too old or if the
-/// service has no replay guard: send it through TLS. Safe on any thread.
+/// Nothing in the result is secret, but anyone who reads the request can send it again until it is too old, unless the
+/// service has a replay guard: send it through TLS. Safe on any thread.
 /// @param token a holder-of-key token, which may have a certificate or a key value
 /// @param identity the private key of the token; it may be a key that cannot be exported
 /// @throws Tarvel::Crypto::KeyMismatchException when `identity` is another key.
@@ -54,7 +54,7 @@ struct HttpSigningOptions {
 ///         covered is missing, is there more than once, or is not ASCII; when the request has one of the new fields already;
 ///         and when an option does not have its form. Nothing is signed before these checks.
 /// @throws Tarvel::Crypto::CryptoException when OpenSSL or the provider of the key fails; Tarvel::InvalidStateException,
-///         Tarvel::OutOfMemoryException as described there.
+///         Tarvel::OutOfMemoryException as in `CryptoException`.
 SSOCLIENT_API std::vector<std::pair<std::string, std::string>>
 SignHttpRequest(const HttpRequest &request, const SamlToken &token, const Tarvel::Crypto::PrivateKey &identity,
                 const HttpSigningOptions &options = {});

@@ -38,8 +38,8 @@ protected:
   ~VerifyingKey() override;
 };
 
-/// The key with this SubjectPublicKeyInfo, which must be in DER. Every key that OpenSSL knows can be read, also one with which
-/// no signature is accepted. This function and those below are safe on any thread.
+/// The key with this SubjectPublicKeyInfo, which must be in DER. Every key that OpenSSL knows can be read, including
+/// keys with which no signature is accepted. This function and those below are safe on any thread.
 /// @throws CryptoException when it cannot be decoded, is not in DER, or further bytes follow it; InvalidStateException,
 ///         OutOfMemoryException as in `CryptoException`, like the functions below.
 TARVEL_API Ref<const VerifyingKey> CreateVerifyingKey(const std::vector<std::uint8_t> &subjectPublicKeyInfo);
