@@ -16,8 +16,8 @@
 
 namespace SsoClient {
 
-/// The signatures anywhere in a message. It refers to elements and attributes of the tree, which must stay until the last call;
-/// others may be added.
+/// The signatures anywhere in a message. It refers to elements and attributes of the tree, which must stay until the
+/// last call; others may be added.
 class ExistingSignatures {
 public:
   /// Reads the tree at `envelope`.

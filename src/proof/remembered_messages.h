@@ -21,8 +21,8 @@ namespace SsoClient {
 ///
 /// It is a hash table with linear probing: an identifier is in the slot that its tag decides, or after it if that slot
 /// was not empty. Each call of `Remember` first sweeps: it takes `SWEPT_SLOTS` steps, so no call takes long. A step
-/// examines one slot, and removes its identifier if it has expired. A removal closes the gap, and moves no identifier to
-/// a slot before the one that is examined next, so one round over all slots finds everything that has expired.
+/// examines one slot, and removes its identifier if it has expired. A removal closes the gap, and moves no identifier
+/// to a slot before the one that is examined next, so one round over all slots finds everything that has expired.
 ///
 /// There is always a place for a new identifier while at most four fifths of the capacity have not expired. Proof: a
 /// round that removes D identifiers takes slots + D steps, so it has at most A = (slots + D) / SWEPT_SLOTS calls, which

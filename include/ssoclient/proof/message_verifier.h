@@ -121,8 +121,9 @@ public:
   ///         accept it.
   /// @throws RepeatedMessageException when the replay guard has received the message before.
   /// @throws ReplayGuardException when the replay guard is full, cannot be reached or throws.
-  /// @throws Tarvel::OutOfMemoryException, std::bad_alloc and Tarvel::InvalidStateException like `TokenVerifier::Verify`.
-  ///         Like a ReplayGuardException they say nothing about the message.
+  /// @throws Tarvel::OutOfMemoryException, std::bad_alloc and Tarvel::InvalidStateException like `TokenVerifier::Verify`;
+  ///         Tarvel::Crypto::CryptoException when OpenSSL fails. Like a ReplayGuardException they say nothing about the
+  ///         message.
   VerifiedMessage Verify(const std::string &message) const;
 
   /// The same for a sender that may have authenticated in TLS. If a signature refers to the token, that signature must
@@ -140,8 +141,8 @@ public:
   /// `accepted` is true exactly when `Verify` accepts the message at the same moment, apart from the guard. A call takes
   /// linear time, but several times as long as `Verify`: call it when a person wants to know why a message is refused, not
   /// for each message.
-  /// @throws Tarvel::OutOfMemoryException, std::bad_alloc and Tarvel::InvalidStateException like `Verify`, and nothing else:
-  ///         no message makes it throw.
+  /// @throws Tarvel::OutOfMemoryException, std::bad_alloc, Tarvel::InvalidStateException and
+  ///         Tarvel::Crypto::CryptoException like `Verify`, and nothing else: no message makes it throw.
   MessageReport Explain(const std::string &message) const;
 
   /// The same for a sender that may have authenticated in TLS.

@@ -19,7 +19,8 @@ namespace SsoClient {
 /// @throws InvalidProofException when it is another key, or the token has no key that can be used.
 /// @throws Tarvel::InvalidArgumentException for a bearer token.
 /// @throws Tarvel::TypeMismatchException for a certificate that this library has not made.
-/// @throws Tarvel::OutOfMemoryException and Tarvel::InvalidStateException as in `Tarvel::Crypto::CryptoException`.
+/// @throws Tarvel::Crypto::CryptoException when OpenSSL fails; Tarvel::OutOfMemoryException and
+///         Tarvel::InvalidStateException as in `CryptoException`.
 SSOCLIENT_API void VerifyTlsProof(const SamlToken &token, const Tarvel::Crypto::Certificate &peerCertificate);
 
 } // namespace SsoClient
