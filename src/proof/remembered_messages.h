@@ -29,8 +29,8 @@ namespace SsoClient {
 /// add at most A identifiers. If D is at least slots / (SWEPT_SLOTS - 1), then A is at most D, and there are not more
 /// identifiers than before the round. Otherwise A is less than slots / (SWEPT_SLOTS - 1), which is less than a fifth of
 /// the capacity, because there are 5/4 slots for each identifier. After such a round, the table contains only these and
-/// identifiers that have not expired in the round: less than 1/5 + 4/5 of the capacity. The two further slots matter for
-/// capacities up to 13 only: there A is at most 2, and counting shows the same.
+/// identifiers that have not expired in the round: less than 1/5 + 4/5 of the capacity. The two further slots matter
+/// for capacities up to 13 only: there A is at most 2, and counting shows the same.
 class RememberedMessages {
 public:
   /// Where the search for an identifier begins.

@@ -121,9 +121,9 @@ public:
   ///         accept it.
   /// @throws RepeatedMessageException when the replay guard has received the message before.
   /// @throws ReplayGuardException when the replay guard is full, cannot be reached or throws.
-  /// @throws Tarvel::OutOfMemoryException, std::bad_alloc and Tarvel::InvalidStateException like `TokenVerifier::Verify`;
-  ///         Tarvel::Crypto::CryptoException when OpenSSL fails. Like a ReplayGuardException they say nothing about the
-  ///         message.
+  /// @throws Tarvel::OutOfMemoryException, std::bad_alloc and Tarvel::InvalidStateException like
+  ///         `TokenVerifier::Verify`; Tarvel::Crypto::CryptoException when OpenSSL fails. Like a ReplayGuardException
+  ///         they say nothing about the message.
   VerifiedMessage Verify(const std::string &message) const;
 
   /// The same for a sender that may have authenticated in TLS. If a signature refers to the token, that signature must
