@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// Base64 in the forms of HTTP header fields and forms.
+/// Base64 and base64url, for HTTP header fields and the parameters of requests.
 
 #pragma once
 

@@ -16,7 +16,7 @@ constexpr const char *CONTENT_DIGEST = "content-digest";
 std::string WriteContentDigest(std::string_view content);
 
 /// Checks each digest of the field by sha-256 and sha-512. Digests by other algorithms are ignored.
-/// @throws InvalidMessageException when the field is malformed, or has a digest by neither of these algorithms.
+/// @throws InvalidMessageException when the field is malformed, or has no digest by either of these algorithms.
 /// @throws InvalidProofException when a digest is not that of `content`.
 void CheckContentDigest(std::string_view field, std::string_view content);
 

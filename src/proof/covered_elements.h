@@ -13,13 +13,14 @@
 
 namespace SsoClient {
 
-/// The targets of `signature` as elements of `document`, in document order and each of them once. A target that is the whole
-/// document is its document element.
+/// The targets of `signature` as elements of `document`, in document order and each of them once. A target that is the
+/// whole document is its document element.
 std::vector<VerifiedMessage::CoveredElement>
 ListCoveredElements(const std::vector<Tarvel::Xml::Security::Signature::Coverage::Target> &targets,
                     const Tarvel::Xml::ElementNode &signature, const Tarvel::Xml::Document &document);
 
-/// Whether `element` is one of the covered elements or inside one of them, and not in a signature that this element omits.
+/// Whether `element` is one of the covered elements or inside one of them, and not in the signature that the covered
+/// element omits.
 bool IsCoveredBy(const std::vector<VerifiedMessage::CoveredElement> &covered,
                  const Tarvel::Xml::ElementNode &element) noexcept;
 

@@ -20,7 +20,7 @@ using Tarvel::SecretText;
 using Parameter = std::pair<std::string, SecretText>;
 
 constexpr std::string_view SAML2_BEARER = "urn:ietf:params:oauth:grant-type:saml2-bearer";
-constexpr std::size_t ESCAPED = 3; // octets for one
+constexpr std::size_t ESCAPED = 3; // characters for one escaped octet
 
 bool IsPrintable(char c) noexcept {
   return c >= ' ' && c <= '~';

@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// `ExistingSignatures`, what the signatures that a message already has cover, so that a change leaves them valid.
+/// `ExistingSignatures`, which checks that a change of a message leaves the signatures in it valid.
 
 #pragma once
 
@@ -16,7 +16,8 @@
 
 namespace SsoClient {
 
-/// The signatures anywhere in a message. It refers to the tree, which must not be changed before the last call.
+/// The signatures anywhere in a message. It refers to elements and attributes of the tree, which must stay until the
+/// last call; others may be added.
 class ExistingSignatures {
 public:
   /// Reads the tree at `envelope`.
@@ -25,11 +26,12 @@ public:
   ExistingSignatures(const Tarvel::Xml::ElementNode &envelope,
                      const std::set<std::string, std::less<>> &newIdentifiers);
 
-  /// @throws InvalidMessageException when a signature covers one of `elements`, or the whole document, or what it covers
-  ///         cannot be found out.
+  /// @throws InvalidMessageException when a signature covers one of `elements`, or the whole document, or what it
+  ///         covers cannot be found out.
   void RequireUncovered(const std::vector<const Tarvel::Xml::ElementNode *> &elements) const;
 
-  /// @throws InvalidMessageException when a new declaration of `prefix` at `element` would change what a signature in it signs.
+  /// @throws InvalidMessageException when a new declaration of `prefix` at `element` would change what a signature
+  ///         inside of it signs.
   void RequireIndependence(const Tarvel::Xml::ElementNode &element, std::string_view prefix) const;
 
 private:

@@ -15,20 +15,22 @@
 
 namespace SsoClient {
 
-/// Names and values of a request in the form in which they are signed. It refers to the request, which must outlive it and must
-/// not be changed.
+/// Names and values of a request in the form in which they are signed. It refers to the request, which must outlive it
+/// and must not be changed.
 class HttpComponents {
 public:
-  /// Checks the form of the method, the target and the header. Takes linear time, except for sorting the names of the fields.
-  /// @throws InvalidMessageException when one of them is malformed, or the header is longer than `MAX_HTTP_HEADER_OCTETS`.
+  /// Checks the form of the method, the target and the header. Takes linear time, except for sorting the names of the
+  /// fields.
+  /// @throws InvalidMessageException when one of them is malformed, or the header is longer than
+  ///         `MAX_HTTP_HEADER_OCTETS`.
   explicit HttpComponents(const HttpRequest &request);
 
-  /// The value of a derived component such as "@method" (RFC 9421, section 2.2); nullopt for a name that no request has, or
-  /// that needs a parameter.
+  /// The value of a derived component such as "@method" (RFC 9421, section 2.2); nullopt for a name that no request
+  /// has, or that needs a parameter.
   std::optional<std::string> FindDerived(std::string_view name) const;
 
-  /// The values of all header fields of this name, which is in lower case, in the form of RFC 9421, section 2.1: without
-  /// blanks around each of them, and with ", " between two of them. nullopt if there is no such field.
+  /// The values of all header fields of this name, which is in lower case, in the form of RFC 9421, section 2.1:
+  /// without blanks around each of them, and with ", " between two of them. nullopt if there is no such field.
   std::optional<std::string> FindField(std::string_view name) const;
 
   /// How many header fields have this name, which is in lower case.

@@ -39,7 +39,8 @@ struct HttpSignatureAlgorithm {
   std::string refusal; ///< why there is none
 };
 
-/// The algorithm is fixed by the key, so a message cannot choose it. RSA keys use the one that every store of keys offers.
+/// The algorithm is fixed by the key, so a message cannot choose it. For RSA keys it is the one that
+/// every key store can use.
 HttpSignatureAlgorithm GetHttpSignatureAlgorithm(const Tarvel::Crypto::VerifyingKey &key);
 
 /// The names of the covered components, in their order.

@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// What a service requires of a request's signature, in addition to its value.
+/// What a service requires of a request's signature, in addition to a correct value.
 
 #pragma once
 
@@ -18,7 +18,8 @@
 namespace SsoClient {
 
 /// The signature by `key`: the one whose `keyid` is the key's thumbprint or, without a `keyid`, the only one.
-/// @throws InvalidProofException when there is no such signature; InvalidMessageException when there are several.
+/// @throws InvalidProofException when there is no such signature; InvalidMessageException when there are several, or a
+///         `keyid` is not a string.
 const HttpSignature &SelectHttpSignature(const std::vector<HttpSignature> &signatures,
                                          const Tarvel::Crypto::VerifyingKey &key);
 
@@ -28,9 +29,10 @@ struct HttpSignatureTimes {
   boost::optional<Tarvel::System::DateTime> expires;
 };
 
-/// Reads the parameters that have a meaning, and checks their types and the algorithm. Others are ignored.
-/// @throws InvalidMessageException when a parameter is not of its type, or `created` is missing; InvalidProofException when
-///         the algorithm is not `algorithm`.
+/// Reads `created`, `expires`, `nonce` and `alg`, and checks their types and the algorithm. Other parameters are
+/// ignored.
+/// @throws InvalidMessageException when a parameter is not of its type, or `created` is missing; InvalidProofException
+///         when the algorithm is not `algorithm`.
 HttpSignatureTimes ReadSignatureParameters(const HttpSignature &signature, const HttpSignatureAlgorithm &algorithm);
 
 /// Checks that the method, the target, the token, the content and the required fields are covered.

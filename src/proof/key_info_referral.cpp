@@ -73,7 +73,7 @@ bool IsTypeOfToken(std::string_view tokenType) {
   return tokenType == WireNames::SAML_TOKEN_TYPE || tokenType == WireNames::SAML_TOKEN_TYPE_AS_PUBLISHED;
 }
 
-KeyReferral OtherThanToken(bool isSaml) {
+KeyReferral OtherReferral(bool isSaml) {
   return isSaml ? KeyReferral::OTHER_TOKEN : KeyReferral::OTHER_KEY;
 }
 
@@ -84,7 +84,7 @@ bool HasText(const ElementNode &element, const std::string &wanted) {
 }
 
 /// What one child of a `wsse:SecurityTokenReference` refers to.
-KeyReferral ReferTo(const ElementNode &child, const std::string &tokenId, bool isSaml) {
+KeyReferral ReadReferenceChild(const ElementNode &child, const std::string &tokenId, bool isSaml) {
   const std::string_view valueType = GetTextAttribute(child, "ValueType");
   if (child.HasQName(Namespaces::WSSE, "KeyIdentifier") && valueType == WireNames::SAML_ID) {
     return HasText(child, tokenId) ? KeyReferral::TOKEN : KeyReferral::OTHER_TOKEN;
@@ -95,16 +95,16 @@ KeyReferral ReferTo(const ElementNode &child, const std::string &tokenId, bool i
       return KeyReferral::TOKEN;
     }
   }
-  return OtherThanToken(isSaml || IsSamlType(valueType) || child.FindChildElement("Assertion"));
+  return OtherReferral(isSaml || IsSamlType(valueType) || child.FindChildElement("Assertion"));
 }
 
-KeyReferral ReferToToken(const ElementNode &reference, const std::string &tokenId) {
+KeyReferral ReadTokenReference(const ElementNode &reference, const std::string &tokenId) {
   const Attribute *const tokenType = reference.FindAttribute(Namespaces::WSSE11, "TokenType");
   const bool isSaml = tokenType && IsSamlType(tokenType->GetValue());
   const KeyReferral referral =
-      JoinChildren(reference, [&](const ElementNode &child) { return ReferTo(child, tokenId, isSaml); });
+      JoinChildren(reference, [&](const ElementNode &child) { return ReadReferenceChild(child, tokenId, isSaml); });
   if (referral == KeyReferral::NOTHING) {
-    return OtherThanToken(isSaml);
+    return OtherReferral(isSaml);
   }
   const bool isOfOtherType = tokenType && !IsTypeOfToken(tokenType->GetValue());
   return referral == KeyReferral::TOKEN && isOfOtherType ? KeyReferral::OTHER_TOKEN : referral;
@@ -143,7 +143,7 @@ KeyReferral FindKeyReferral(const ElementNode &signature, const SamlToken &token
     bool statesKey = false;
     const KeyReferral referral = JoinChildren(keyInfo, [&](const ElementNode &child) {
       if (child.HasQName(Namespaces::WSSE, "SecurityTokenReference")) {
-        return ReferToToken(child, token.GetId());
+        return ReadTokenReference(child, token.GetId());
       }
       const bool isKey = StatesKey(child);
       statesKey = statesKey || isKey;

@@ -12,9 +12,9 @@
 
 namespace SsoClient {
 
-/// Asks the kernel for large pages, where a whole one has a place in the array. Otherwise, nearly each read of a random place also
-/// waits for the processor to find the page, which takes as long as the read itself. Without large pages, the array works the
-/// same.
+/// Asks the kernel for large pages, for the part of the array that consists of whole ones. With small pages, nearly
+/// every read of a random place also waits until the processor has found the page, which takes as long as the read
+/// itself. If the kernel has no large pages, the array is only slower.
 template <typename T>
 class LargePageAllocator {
 public:

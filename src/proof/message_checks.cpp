@@ -69,7 +69,7 @@ bool IsKeyOf(const Certificate &peerCertificate, const CheckedMessage &message) 
                                                                     Ref<const Certificate>(&peerCertificate)));
 }
 
-/// The proof of a bearer token. No signature can belong to it.
+/// Checks that a bearer token is accepted, and that no signature refers to it: it has no key.
 void CheckBearer(const ElementNode *signature, const MessageRules &rules, CheckedMessage &message) {
   if (signature) {
     Refuse(rules.sinks.proof, *signature, "", "",

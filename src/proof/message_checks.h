@@ -2,8 +2,8 @@
 /// @file
 /// The rules by which a message is verified, in their order.
 ///
-/// Each of them reports to sinks, and continues if the sinks do not throw. It then needs only what an earlier rule could
-/// read, so a report can run it even if an earlier rule has refused the message.
+/// Each of them reports to sinks, and continues if the sinks do not throw. It then needs only what an earlier rule
+/// could read, so a report can run it even if an earlier rule has refused the message.
 
 #pragma once
 
@@ -65,12 +65,12 @@ void CheckTimestamp(const MessageRules &rules, CheckedMessage &message);
 void FindToken(const MessageRules &rules, CheckedMessage &message);
 
 /// Verifies the token, which must have been found. It stays null if it has no canonical form.
-/// @throws ParseException and InvalidSignatureException, whatever the sinks are, when the token is refused.
+/// @throws ParseException and InvalidSignatureException, with every kind of sinks, when the token is refused.
 void VerifyToken(const TokenVerifier &tokens, const MessageRules &rules, CheckedMessage &message);
 
-/// Checks that the sender has proved what the options require, with the token, which must not be null.
-/// @throws Tarvel::TypeMismatchException for a peer certificate that this library has not made, and what OpenSSL's failures
-///         become.
+/// Checks that the sender of the token, which must not be null, has proved what the options require.
+/// @throws Tarvel::TypeMismatchException for a peer certificate that this library has not made, and what
+///         `GetConfirmationKey` throws.
 void CheckProof(const Tarvel::Xml::Document &document, const MessageRules &rules, CheckedMessage &message);
 
 /// Checks that each part that must be covered is there once and, if the proof is a signature, that it is covered.

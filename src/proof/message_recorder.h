@@ -17,8 +17,8 @@
 
 namespace SsoClient {
 
-/// Records the checks of a verification one after the other. The report must outlive the recorder, and the tree must not be
-/// changed.
+/// Records the checks of a verification one after the other. The report must outlive the recorder, and the tree must
+/// not be changed.
 class MessageRecorder final : public DeviationSink {
 public:
   /// Adds all checks to `report`, as not done yet.

@@ -8,8 +8,8 @@
 
 namespace SsoClient {
 
-/// One sink for each exception with which a message is refused. Verification and reports run the same rules: the sinks of a
-/// verification throw at the first deviation, and those of a report are all the same sink, which keeps it.
+/// One sink for each exception with which a message is refused. Verification and reports run the same rules: the sinks
+/// of a verification throw at the first deviation, and those of a report are all the same sink, which keeps it.
 struct MessageSinks {
   DeviationSink &form;  ///< throws `InvalidMessageException`
   DeviationSink &proof; ///< throws `InvalidProofException`

@@ -10,8 +10,9 @@
 
 namespace SsoClient {
 
-/// The document as UTF-8 text without an XML declaration, with the comments and processing instructions before and after the
-/// document element. The white space around these is one line end for each.
+/// The document as UTF-8 text without an XML declaration, with the comments and processing instructions before and
+/// after the document element. White space outside of the document element becomes one line end between two of these
+/// nodes.
 std::string WriteMessage(const Tarvel::Xml::Document &document);
 
 } // namespace SsoClient

@@ -23,8 +23,9 @@ struct MessageTimestamp {
   boost::optional<Tarvel::System::DateTime> expires;
 };
 
-/// Reads the timestamp that is a child of `security`. It must have a creation time, may have an end, which must be later, and
-/// must have nothing else. Texts with a comment in between are refused, because a comment could cut off a part of them.
+/// Reads the timestamp that is a child of `security`. It must have a creation time, may have an expiry time, which must
+/// be later, and must have nothing else. A date with a comment in the middle is refused, because another reader may
+/// take only one part of it.
 MessageTimestamp ReadTimestamp(const Tarvel::Xml::ElementNode &security, bool isRequired, DeviationSink &sink);
 
 /// Checks what could be read of `timestamp` against this machine's clock.

@@ -15,15 +15,15 @@
 
 namespace SsoClient {
 
-/// The one signature of the security header whose key information refers to the token; null if there is none. Signatures by
-/// other keys are ignored. Signatures that refer to another token, to several things, or to the token for a second time are
-/// refused, and so is a header with very many signatures.
+/// The one signature of the security header whose key information refers to the token; null if there is none.
+/// Signatures by other keys are ignored. Signatures that refer to another token, to several things, or to the token
+/// for a second time are refused, and so is a header with more than `MAX_HEADER_SIGNATURES`.
 /// @param key the token's key; may be null
 const Tarvel::Xml::ElementNode *FindProofSignature(const Tarvel::Xml::ElementNode &security, const SamlToken &token,
                                                    const Tarvel::Crypto::VerifyingKey *key, DeviationSink &sink);
 
 /// Verifies the signature with the token's key. Returns what it covers; empty if it is refused.
-/// @throws Tarvel::OutOfMemoryException and Tarvel::InvalidStateException, which are no verdict.
+/// @throws Tarvel::OutOfMemoryException and Tarvel::InvalidStateException, which say nothing about the signature.
 boost::optional<Tarvel::Xml::Security::Signature::Coverage>
 VerifyProofSignature(const Tarvel::Xml::ElementNode &signature, const Tarvel::Crypto::VerifyingKey &key,
                      DeviationSink &sink);

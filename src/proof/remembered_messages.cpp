@@ -10,8 +10,8 @@ namespace {
 
 constexpr int TAG_BITS = 32;
 
-// A quarter of the slots of a full table is more than what linear probing needs to stay fast. Two more keep a slot empty in
-// the smallest tables, too, so that each search ends.
+// One fifth of the slots of a full table is empty, so that linear probing stays fast. The two further slots keep a slot
+// empty in the smallest tables, too, so that each search ends.
 std::size_t CountSlots(std::size_t capacity) {
   return capacity + capacity / 4 + 2;
 }
@@ -40,7 +40,7 @@ ReplayGuard::Answer RememberedMessages::Remember(const Place &place, const Messa
       return ReplayGuard::Answer::REPEATED;
     }
   }
-  // Until these times, an unknown identifier may have been known and removed.
+  // An unknown identifier with an `until` that is not later than these times may have been known and removed.
   if (until <= std::max(now, m_forgottenUntil) || m_count == m_capacity) {
     return ReplayGuard::Answer::UNAVAILABLE;
   }

@@ -16,22 +16,27 @@
 
 namespace SsoClient {
 
-/// Identifiers, each with the time until which it is remembered. For one thread at a time. Times are microseconds since 1970,
-/// UTC.
+/// Identifiers, each with the time until which it is remembered. For one thread at a time. Times are microseconds
+/// since 1970, UTC.
 ///
-/// It is a hash table with linear probing. Its slots are in the order of the tags, with displaced ones after their place, so
-/// one sweep over the slots finds everything that has expired. Each call sweeps `SWEPT_SLOTS` of them and closes the gaps. So
-/// no call takes long, and there is always a place for a new identifier while at most four fifths of the capacity have not
-/// expired. Proof: in the calls of one round over all slots, D identifiers are removed and at most R = (slots + D) / SWEPT_SLOTS
-/// are added. If D is at least slots / (SWEPT_SLOTS - 1), there are not more identifiers than before. Otherwise R is at most
-/// slots / (SWEPT_SLOTS - 1), and what remains are these and identifiers that have not expired in the round: with 5/4 slots
-/// for each, less than 4/5 + 1/5 of the capacity.
+/// It is a hash table with linear probing: an identifier is in the slot that its tag decides, or after it if that slot
+/// was not empty. Each call of `Remember` first sweeps: it takes `SWEPT_SLOTS` steps, so no call takes long. A step
+/// examines one slot, and removes its identifier if it has expired. A removal closes the gap, and moves no identifier
+/// to a slot before the one that is examined next, so one round over all slots finds everything that has expired.
+///
+/// There is always a place for a new identifier while at most four fifths of the capacity have not expired. Proof: a
+/// round that removes D identifiers takes slots + D steps, so it has at most A = (slots + D) / SWEPT_SLOTS calls, which
+/// add at most A identifiers. If D is at least slots / (SWEPT_SLOTS - 1), then A is at most D, and there are not more
+/// identifiers than before the round. Otherwise A is less than slots / (SWEPT_SLOTS - 1), which is less than a fifth of
+/// the capacity, because there are 5/4 slots for each identifier. After such a round, the table contains only these and
+/// identifiers that have not expired in the round: less than 1/5 + 4/5 of the capacity. The two further slots matter
+/// for capacities up to 13 only: there A is at most 2, and counting shows the same.
 class RememberedMessages {
 public:
-  /// Finds an identifier in a table.
+  /// Where the search for an identifier begins.
   struct Place {
     std::uint32_t tag = 0; ///< never 0
-    std::size_t slot = 0;  ///< where the search begins
+    std::size_t slot = 0;  ///< the first slot of the search
   };
 
   /// An empty table, with all memory that it will ever use.
@@ -39,8 +44,8 @@ public:
   /// @throws std::bad_alloc
   RememberedMessages(std::size_t capacity, const SipHashKey &key);
 
-  /// Computes the place of `identifier`, and makes the processor fetch its memory. Uses nothing that changes: any thread may
-  /// call it at any time.
+  /// Computes the place of `identifier`, and makes the processor fetch its memory. Uses nothing that changes: any
+  /// thread may call it at any time.
   Place Prepare(const MessageIdentifier &identifier) const noexcept;
 
   /// Remembers the identifier, whose place is `place`, if it is not known.
@@ -66,8 +71,7 @@ private:
   Array<MessageIdentifier> m_identifiers;
   std::size_t m_count = 0;
   std::size_t m_sweep = 0; // the slot at which the next sweep begins
-  // The latest end of a time for which an identifier that was removed was remembered. Only after the clock was set back, it
-  // can be in the future.
+  // The latest `until` of all identifiers that were removed. It is in the future only after the clock was set back.
   std::int64_t m_forgottenUntil = std::numeric_limits<std::int64_t>::min();
 };
 

@@ -29,8 +29,8 @@ ReplayGuard::Answer Ask(ReplayGuard &guard, const MessageIdentifier &identifier,
 
 MessageIdentifier IdentifyMessage(std::string_view signedAs, const std::vector<std::uint8_t> &signedDigest,
                                   const Tarvel::Crypto::VerifyingKey &key) {
-  // Two different lists of these parts make different texts: the first ends at the only line end before the thumbprint,
-  // and the thumbprint always has the same length.
+  // Other parts always make another text: `signedAs` ends at the first line end, and the thumbprint always has the same
+  // length.
   std::string text(signedAs);
   text += '\n';
   text += key.GetSha256Thumbprint();

@@ -22,14 +22,14 @@ constexpr std::string_view HTTP_REQUEST = "HTTP request"; ///< RFC 9421
 } // namespace SignedAs
 
 /// The identifier of a message that `key` has signed.
-/// @param signedDigest the digest of what the signature's value signs: the canonical `SignedInfo`, or the signature base of
-///        RFC 9421
+/// @param signedDigest the digest of what the signature's value signs: the canonical `SignedInfo`, or the signature
+///         base of RFC 9421
 /// @throws what `ComputeDigest` throws.
 MessageIdentifier IdentifyMessage(std::string_view signedAs, const std::vector<std::uint8_t> &signedDigest,
                                   const Tarvel::Crypto::VerifyingKey &key);
 
-/// Asks the guard whether the message is received for the first time. Call it last, when every other check has passed, so
-/// that a message that is refused takes no place in the guard.
+/// Asks the guard whether the message is received for the first time. Call it last, when every other check has passed,
+/// so that a message that is refused takes no place in the guard.
 /// @param until the first moment at which the message is stale
 /// @throws RepeatedMessageException when the guard knows the message.
 /// @throws ReplayGuardException when it is not available, or throws.

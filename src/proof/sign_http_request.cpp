@@ -38,7 +38,7 @@ void RequireOptions(const HttpSigningOptions &options) {
   }
 }
 
-/// The key that the signature proves.
+/// The key of `token`, which must be that of `identity`.
 Ref<const VerifyingKey> RequireKey(const SamlToken &token, const PrivateKey &identity) {
   if (token.GetConfirmationMethod() != SamlToken::HOLDER_OF_KEY) {
     throw InvalidArgumentException(

@@ -50,7 +50,7 @@ void RequireKeyOfToken(const PrivateKey &identity, const SamlToken &token, const
   }
 }
 
-/// The algorithm for a key on which the profile of signatures has no objection.
+/// The algorithm for a key with which signatures are accepted.
 std::string_view AlgorithmFor(const VerifyingKey &key) {
   if (key.GetAlgorithm() == "RSA") {
     return SignatureUri::RSA_SHA256;

@@ -2,7 +2,8 @@
 /// @file
 /// What the references of a signature refer to, and how its canonical forms depend on the elements around it.
 ///
-/// These functions read signatures that others made and that are not verified here, in any form that XML Signature allows.
+/// These functions read signatures that others made and that are not verified here, in any form that XML Signature
+/// allows.
 
 #pragma once
 
@@ -27,7 +28,8 @@ void ForEachPrefix(std::string_view prefixList, const Function &function) {
   }
 }
 
-/// A canonical form, and how it depends on declarations of the elements around its apex.
+/// A canonical form, and how it depends on declarations of the elements around its apex, which is its outermost
+/// element.
 struct ContextOfForm {
   bool isInclusive = false;    ///< it contains every declaration in scope
   std::string_view prefixList; ///< it contains the declarations of these prefixes, separated by white space

@@ -16,7 +16,8 @@ struct SipHashKey {
   std::uint64_t high = 0;
 };
 
-/// SipHash-2-4 of the 32 octets. Without the key, it cannot be predicted, and identifiers with similar values cannot be found.
+/// SipHash-2-4 of the 32 octets. Without the key, the values cannot be predicted, so a sender cannot choose
+/// identifiers with similar values.
 std::uint64_t ComputeSipHash(const SipHashKey &key, const MessageIdentifier &identifier) noexcept;
 
 } // namespace SsoClient

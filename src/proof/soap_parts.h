@@ -2,9 +2,9 @@
 /// @file
 /// The parts of a SOAP 1.1 or 1.2 message: envelope, header, body, the security headers by role, identifiers.
 ///
-/// Both sides of a proof find the parts with these functions, so what is signed is what is read. The functions only search:
-/// what they did not find, or found twice, is in the result, and each side has its own text for it. All of them take
-/// linear time, and no memory that depends on the message.
+/// Both sides of a proof find the parts with these functions, so what is signed is what is read. The functions only
+/// search: what they did not find, or found twice, is in the result, and each side has its own text for it. All of
+/// them take linear time, and no memory that depends on the message.
 
 #pragma once
 
@@ -40,16 +40,16 @@ struct SoapEnvelope {
   EnvelopeFault fault = EnvelopeFault::NONE;         ///< the first fault in document order
   const Tarvel::Xml::Node *place = nullptr;          ///< of the fault: the node that should not be there, or the
                                                      ///< envelope; null if there is no document element
-  SoapVersion version = SoapVersion::SOAP11;         ///< valid unless the fault is one of the first two
+  SoapVersion version = SoapVersion::SOAP11;         ///< not set if the fault is NOT_AN_ENVELOPE or OTHER_VERSION
   const Tarvel::Xml::ElementNode *element = nullptr; ///< the document element; may be null
   const Tarvel::Xml::ElementNode *header = nullptr;  ///< the first header; null if there is none
   const Tarvel::Xml::ElementNode *body = nullptr;    ///< the first body; null if there is none
 };
 
-/// The envelope that `element`, a document element, is. Null is not an envelope.
+/// Reads `element`, the document element, as an envelope. Null is not an envelope.
 SoapEnvelope ReadEnvelope(const Tarvel::Xml::ElementNode *element) noexcept;
 
-/// The elements that a search has found, in document order. At most one is right for every search here.
+/// The first two elements that a search has found, in document order. Every search here expects at most one.
 struct FoundElements {
   const Tarvel::Xml::ElementNode *first = nullptr;  ///< null if there is none
   const Tarvel::Xml::ElementNode *second = nullptr; ///< null if there is at most one
@@ -65,8 +65,9 @@ FoundElements FindHeaderBlocks(const SoapEnvelope &envelope, const MessagePart &
 /// The `wsse:Security` headers of `envelope` for `role`.
 FoundElements FindSecurityHeaders(const SoapEnvelope &envelope, std::string_view role) noexcept;
 
-/// The actor (SOAP 1.1, section 4.2.2) or role (SOAP 1.2 part 1, section 5.2.2) of a header block, without white space at
-/// either end. Empty for the last receiver: without the attribute, with an empty one, and for "ultimateReceiver" in SOAP 1.2.
+/// The actor (SOAP 1.1, section 4.2.2) or role (SOAP 1.2 part 1, section 5.2.2) of a header block, without white space
+/// at either end. Empty for the last receiver: without the attribute, with an empty one, and for "ultimateReceiver" in
+/// SOAP 1.2.
 std::string_view GetRole(const Tarvel::Xml::ElementNode &block, SoapVersion version) noexcept;
 
 /// The same for the value of the attribute, which a caller may have as an option.
@@ -76,8 +77,8 @@ std::string_view NormaliseRole(std::string_view role, SoapVersion version) noexc
 /// whose value a reference can contain. Null if there is none.
 const Tarvel::Xml::Attribute *FindIdentifier(const Tarvel::Xml::ElementNode &element) noexcept;
 
-/// Whether references can refer to `element` by the value of `attribute`, which is one of its attributes. These are the four
-/// names that the platform's signatures resolve.
+/// Whether references can refer to `element` by the value of `attribute`, which is one of its attributes. These are
+/// the four names that the platform's signatures resolve.
 bool IsIdentifier(const Tarvel::Xml::Attribute &attribute, const Tarvel::Xml::ElementNode &element) noexcept;
 
 } // namespace SsoClient

@@ -2,9 +2,9 @@
 /// @file
 /// Structured fields of HTTP (RFC 8941): the header fields that are dictionaries.
 ///
-/// The reader is stricter than RFC 8941, because what it reads decides what is accepted: a key that appears twice, Base64 that
-/// is not canonical, and more than the limits below are refused. The types that only RFC 9651 has (dates, display strings) are
-/// not read.
+/// The reader is stricter than RFC 8941, because what it reads decides what is accepted: a key that appears twice,
+/// Base64 that is not canonical, and more than the limits below are refused. The types that only RFC 9651 has (dates,
+/// display strings) are not read.
 
 #pragma once
 

@@ -23,7 +23,8 @@ void RequireNumber(bool isValid, const char *options, const char *name, const ch
   }
 }
 
-/// How long after its creation a message is refused, in seconds. Both numbers may be the largest there are.
+/// The age from which a message is refused, in seconds. Does not overflow, even if both numbers are the largest
+/// possible.
 std::int64_t LongestAge(const TimeWindow &window) noexcept {
   return window.maxAgeSec > std::numeric_limits<std::int64_t>::max() - window.clockToleranceSec
              ? std::numeric_limits<std::int64_t>::max()

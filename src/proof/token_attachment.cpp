@@ -172,8 +172,9 @@ std::string TokenAttachment::Identify(ElementNode &element) {
   return CreateWssuId(&element);
 }
 
-// WS-Security, section 5: new elements are before those that the header has, and a token is before the signature that uses it.
-// The signature can only be made while what it signs is in the tree, so the others are moved.
+// WS-Security, section 5: new elements are before those that the header has, and a token is before the signature that
+// uses it. The signature can be made only when the token and the timestamp are in the tree, so these two are moved to
+// their places.
 void TokenAttachment::Finish(const Ref<ElementNode> &signature) {
   for (const Ref<ElementNode> &element : {signature, m_token.Get(), m_newTimestamp}) {
     if (element) {

@@ -57,11 +57,11 @@ private:
   const SecurityHeaderOptions &m_options;
   const TokenElement m_token;
   const SoapEnvelope m_parts;
-  Tarvel::Xml::ElementNode *const m_envelope; // null if it is not an envelope
-  Tarvel::Xml::ElementNode *m_header;         // null until there is one; the same for the next two
-  Tarvel::Xml::ElementNode *const m_body;
-  Tarvel::Xml::ElementNode *m_security = nullptr;
-  Tarvel::Xml::ElementNode *m_timestamp = nullptr;
+  Tarvel::Xml::ElementNode *const m_envelope;           // never null
+  Tarvel::Xml::ElementNode *m_header;                   // null until there is one
+  Tarvel::Xml::ElementNode *const m_body;               // never null
+  Tarvel::Xml::ElementNode *m_security = nullptr;       // null until there is one
+  Tarvel::Xml::ElementNode *m_timestamp = nullptr;      // null until there is one
   Tarvel::Ref<Tarvel::Xml::ElementNode> m_newTimestamp; // null if the message had one
   const ExistingSignatures m_signatures;
   TreeChanges m_changes;

@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// `TokenElement`, the assertion of a token that is added to a message of others.
+/// `TokenElement`, the assertion of a token that is added to the caller's message.
 
 #pragma once
 
@@ -19,8 +19,8 @@ namespace SsoClient {
 class TokenElement {
 public:
   /// Reads the text of `token`.
-  /// @throws Tarvel::InvalidArgumentException when the token's signature depends on what is around the token: it uses inclusive
-  ///         canonicalisation, or refers to its whole document. @throws what `ParseXML` throws.
+  /// @throws Tarvel::InvalidArgumentException when the token's signature depends on what is around the token: it uses
+  ///         inclusive canonicalisation, or refers to its whole document. @throws what `ParseXML` throws.
   explicit TokenElement(const SamlToken &token);
 
   const Tarvel::Ref<Tarvel::Xml::ElementNode> &Get() const noexcept { return m_assertion; }
@@ -28,9 +28,10 @@ public:
   /// The identifiers of the assertion and of the elements in it, and that of the token object.
   const std::set<std::string, std::less<>> &GetIdentifiers() const noexcept { return m_identifiers; }
 
-  /// Prepares the assertion for becoming a child of `parent`: its names without a prefix stay in the namespace in which they
-  /// are. `parent` does not change.
-  /// @throws InvalidMessageException when the token's signature includes a prefix that is declared at `parent`.
+  /// Prepares the assertion for becoming a child of `parent`: its names without a prefix stay in the namespace in
+  /// which they are. `parent` does not change.
+  /// @throws InvalidMessageException when the token's signature includes a prefix that is declared in scope of
+  ///         `parent`, and not in the token.
   void PrepareFor(const Tarvel::Xml::ElementNode &parent) const;
 
 private:

@@ -20,7 +20,7 @@ void RequireTokenHeader(const TokenHeader &form);
 std::string WriteTokenField(const SamlToken &token, const TokenHeader &form);
 
 /// The token's XML.
-/// @throws InvalidMessageException when there is no such field, there are two of them, or its value has another form.
+/// @throws InvalidMessageException when there is no such field, more than one, or its value has another form.
 std::string ReadTokenField(const HttpComponents &components, const TokenHeader &form);
 
 } // namespace SsoClient

@@ -11,8 +11,8 @@
 
 namespace SsoClient {
 
-/// Records changes of a tree. When it is destroyed, it undoes them, unless `Keep` was called. So a function that fails in the
-/// middle leaves the tree of its caller as it was.
+/// Records changes of a tree. When it is destroyed, it undoes them, unless `Keep` was called. So a function that fails
+/// in the middle leaves the tree of its caller as it was.
 class TreeChanges {
 public:
   TreeChanges() = default;

@@ -16,19 +16,20 @@
 
 namespace SsoClient {
 
-/// Why a message is accepted or refused: each check of `MessageVerifier::Verify` with its outcome. Every check is reported,
-/// even if an earlier one failed. All texts except `refusal` and the claims of `token` are printable, and long values are
-/// cut, as in a `TokenReport`. It contains names, but no secret and no token, and refers to nothing outside itself except
-/// trusted certificates. **None of it may be trusted, even if the message is accepted**: use `MessageVerifier::Verify`.
+/// Why a message is accepted or refused: each check of `MessageVerifier::Verify` with its outcome. Every check is
+/// reported, even if an earlier one failed. All texts except `refusal` and the claims of `token` are printable, and
+/// long values are cut, as in a `TokenReport`. It contains names, but no secret and no token, and refers to nothing
+/// outside itself except trusted certificates. **None of it may be trusted, even if the message is accepted**: use
+/// `MessageVerifier::Verify`.
 struct MessageReport {
   /// The checks, in the order of the verification.
   enum class Check : std::int32_t {
     WELL_FORMED = 0, ///< the text is a well-formed XML document within the limits
     ENVELOPE,        ///< it is a SOAP 1.1 or 1.2 envelope with one body, after at most one header
     SECURITY_HEADER, ///< there is exactly one WS-Security header for the role
-    TIMESTAMP,       ///< at most one timestamp, which can be read and whose time has come and has not passed
+    TIMESTAMP,       ///< there is one timestamp, or none if it is optional; it can be read and is valid now
     TOKEN,           ///< there is exactly one token, and the `TokenVerifier` accepts it
-    PROOF,           ///< the sender proved possession of the token's key, if it is a holder-of-key token
+    PROOF,           ///< the sender proved possession of the token's key, or a bearer token is accepted
     PARTS            ///< each part that must be covered is there once, and is covered
   };
 
@@ -52,8 +53,8 @@ struct MessageReport {
 /// The name of a check in lower case with hyphens, such as "security-header".
 SSOCLIENT_API const char *GetCheckName(MessageReport::Check check) noexcept;
 
-/// `report` as text for a log or a person, in the form of `WriteTokenReport`: a line with the verdict, a line for each check,
-/// and below it a few lines for each finding. If there is a token, its report follows.
+/// `report` as text for a log or a person, in the form of `WriteTokenReport`: a line with the verdict, a line for each
+/// check, and below it a few lines for each finding. If there is a token, its report follows.
 SSOCLIENT_API std::string WriteMessageReport(const MessageReport &report);
 
 } // namespace SsoClient

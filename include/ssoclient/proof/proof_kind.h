@@ -12,7 +12,7 @@ namespace SsoClient {
 
 /// What the sender of a token has proved.
 enum class ProofKind : std::int32_t {
-  BEARER = 0,        ///< nothing but that it has the token
+  BEARER = 0,        ///< nothing except that it has the token
   MESSAGE_SIGNATURE, ///< that it has the token's key: it signed the message or request with it
   TLS_CERTIFICATE    ///< that it has the token's key: it authenticated the connection with it
 };

@@ -14,8 +14,9 @@
 
 namespace SsoClient {
 
-/// Identifies a signed message: SHA-256 over what was signed, in canonical form, and over the thumbprint of the key. The
-/// signature's value is not part of it, because some algorithms have several valid values for one message. Not secret.
+/// Identifies a signed message: SHA-256 over what was signed, in canonical form, and over the thumbprint of the key.
+/// The signature's value is not part of it, because some algorithms have several valid values for one message. Not
+/// secret.
 using MessageIdentifier = std::array<std::uint8_t, 32>;
 
 /// Remembers messages. An implementation may be called on any number of threads at once.
@@ -28,9 +29,10 @@ public:
     UNAVAILABLE ///< the guard is full or cannot be reached; the message is not remembered
   };
 
-  /// Remembers the message, at least until `until`, and answers whether it was known. Both happen in one step: of several
-  /// calls with one identifier at the same time, one is answered FIRST. It may block, for example on the network.
-  /// What it throws is reported as UNAVAILABLE.
+  /// Remembers the message, at least until `until`, and answers whether it was known. Both happen in one step: of
+  /// several calls with one identifier at the same time, at most one is answered FIRST. The function may block, for
+  /// example on the network. If it throws, the message is refused by a `ReplayGuardException`, like after
+  /// UNAVAILABLE.
   virtual Answer Remember(const MessageIdentifier &identifier, const Tarvel::System::DateTime &until) = 0;
 
 protected:
@@ -43,15 +45,16 @@ protected:
 /// The largest capacity of a guard in memory.
 constexpr std::size_t MAX_MEMORY_REPLAY_GUARD_CAPACITY = 100'000'000;
 
-/// A guard in the memory of this process. It remembers at most `capacity` messages, and answers UNAVAILABLE to more. Messages
-/// that have expired are removed gradually, a few in each call. While at most four fifths of `capacity` have not expired, a
-/// new message always has a place.
+/// A guard in the memory of this process. It remembers at most `capacity` messages, and answers UNAVAILABLE to more.
+/// Messages that have expired are removed gradually, a few in each call. While at most four fifths of `capacity` have
+/// not expired, a new message always has a place.
 ///
-/// It uses at most 56 bytes for each message of `capacity` and less than 1 KiB in addition, all of them from the beginning. A
-/// call never waits for many messages that expire at once.
+/// It uses at most 56 bytes for each message of `capacity` and less than 1 KiB in addition, all of them from the
+/// beginning. A call never waits for many messages that expire at once.
 ///
-/// The clock is that of the machine. The guard also answers UNAVAILABLE, and remembers nothing, if `until` is not in the
-/// future. After the clock was set back, it does the same up to the latest `until` of a message that it has removed. So of all
+/// The clock is that of the machine. The guard also answers UNAVAILABLE to a message that it does not know, and
+/// remembers nothing, if `until` is not in the future. After the clock was set back, it does the same if `until` is not
+/// later than the latest `until` of the messages that it has removed, because the message may be one of them. So of all
 /// calls with one identifier and one `until`, only one is ever answered FIRST, even if the clock changes.
 ///
 /// A child made by `fork` gets a copy of the guard. After that, parent and child do not know each other's messages.

@@ -12,14 +12,16 @@
 namespace SsoClient {
 
 /// Checks that the sender of a holder-of-key token has its key: the key of `peerCertificate`, with which the sender
-/// authenticated in the TLS handshake, is the key of the token. The keys are compared, not the certificates, so neither dates
-/// nor issuer of `peerCertificate` matter here. How strong the key must be is decided by the TLS server. Safe on any thread.
-/// @param token a token that is verified; made by this library, or with a certificate
-/// @param peerCertificate from the handshake that is complete, and not from a header that a sender can write
-/// @throws InvalidProofException when it is another key.
+/// authenticated in the TLS handshake, is the key of the token. The keys are compared, not the certificates, so
+/// neither dates nor issuer of `peerCertificate` matter here. The TLS server decides how strong the key must be. Safe
+/// on any thread.
+/// @param token a verified token; one that this library has not made must have a certificate
+/// @param peerCertificate from a completed handshake, and never from a header field that a sender can write
+/// @throws InvalidProofException when it is another key, or the token has no key that can be used.
 /// @throws Tarvel::InvalidArgumentException for a bearer token.
 /// @throws Tarvel::TypeMismatchException for a certificate that this library has not made.
-/// @throws Tarvel::OutOfMemoryException and Tarvel::InvalidStateException as in `Tarvel::Crypto::CryptoException`.
+/// @throws Tarvel::Crypto::CryptoException when OpenSSL fails; Tarvel::OutOfMemoryException and
+///         Tarvel::InvalidStateException as in `CryptoException`.
 SSOCLIENT_API void VerifyTlsProof(const SamlToken &token, const Tarvel::Crypto::Certificate &peerCertificate);
 
 } // namespace SsoClient

@@ -20,7 +20,7 @@ public:
   explicit PreparedKey(KeyHandle native);
 
   KeyKind GetKind() const noexcept { return m_kind; }
-  /// Size of the RSA modulus or of the curve's order. For other kinds of keys it is what OpenSSL says, or 0.
+  /// Size of the RSA modulus or of the curve's order. For other kinds of keys it is what OpenSSL reports, or 0.
   unsigned GetBits() const noexcept { return m_bits; }
   /// "RSA", "EC" for a key on any curve, or empty.
   const char *GetAlgorithm() const noexcept { return m_algorithm; }

@@ -26,7 +26,8 @@ public:
   bool IsInAddedProvider() const noexcept { return m_isInAddedProvider; }
   KeyContexts &GetSignContexts() const noexcept { return m_signContexts; }
 
-  /// The public key that belongs to it. Encoding it costs nearly as much as a signature, so it is kept after the first call.
+  /// The public key that belongs to this key. Making it takes nearly as long as a signature, so it is kept after the
+  /// first call.
   /// @throws CryptoException when the provider of the key fails; InvalidStateException; OutOfMemoryException.
   Ref<const VerifyingKey> GetPublicKey() const;
 
@@ -41,7 +42,7 @@ private:
   bool m_isInAddedProvider = false;
   KeyHandle m_native; // OpenSSL wipes the key's numbers when it frees them
   mutable KeyContexts m_signContexts;
-  mutable std::atomic<const VerifyingKey *> m_publicKey{nullptr}; // with one count of its references
+  mutable std::atomic<const VerifyingKey *> m_publicKey{nullptr}; // owns one reference; null until it is made
 };
 
 /// Downcasts `key`.

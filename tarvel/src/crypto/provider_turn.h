@@ -11,12 +11,12 @@ namespace Tarvel::Crypto {
 /// Whether `key` is in a provider that the machine's configuration has added, such as one for a TPM.
 bool IsInAddedProvider(const EVP_PKEY *key) noexcept;
 
-/// While one exists that is needed, every other thread that needs one waits. Some providers for hardware are not safe on
-/// several threads (tpm2-openssl 1.1 is not), and hardware does one operation after the other anyway. OpenSSL's own
-/// providers need no turns.
+/// Only one thread at a time has a turn that is needed; others that need one wait for it. Some providers for hardware
+/// are not safe on several threads (tpm2-openssl 1.1 is not), and hardware does one operation after the other anyway.
+/// OpenSSL's own providers need no turns.
 class ProviderTurn {
 public:
-  /// Begins the turn, if `isNeeded`.
+  /// Waits for the turn of this thread and begins it, if `isNeeded`. Otherwise the object does nothing.
   explicit ProviderTurn(bool isNeeded);
   ProviderTurn(const ProviderTurn &) = delete;
   ProviderTurn &operator=(const ProviderTurn &) = delete;

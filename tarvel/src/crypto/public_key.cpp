@@ -77,7 +77,7 @@ KeyContextHandle NewVerifyContext(EVP_PKEY *sharedKey, SignatureScheme scheme, D
 }
 
 // Prefers the provider of the key. By default, OpenSSL 3.0 uses the first provider that has the algorithm, such as the default
-// one, and gives it what can be exported of the key. Of a key in a TPM, this is only the public part.
+// one, and passes it what can be exported of the key. For a key in a TPM, this is only the public part.
 std::string PreferOwnProvider(const EVP_PKEY *key) {
   const OSSL_PROVIDER *const provider = EVP_PKEY_get0_provider(key);
   return provider ? std::string("?provider=") + OSSL_PROVIDER_get0_name(provider) : "";

@@ -2,9 +2,9 @@
 /// @file
 /// The certificates that were decoded last.
 ///
-/// Each token of a holder of key contains the holder's certificate, and decoding one takes OpenSSL three times as long as
+/// Most holder-of-key tokens contain the holder's certificate, and decoding one takes OpenSSL three times as long as
 /// checking a signature. A service receives many tokens of few holders, so a few certificates are kept, with the contexts
-/// for checking signatures that belong to them. They are kept until the process ends, and other certificates replace them.
+/// for checking signatures that belong to them. Each is kept until another one replaces it, or until the process ends.
 
 #pragma once
 
@@ -20,7 +20,7 @@ namespace Tarvel::Crypto {
 /// after `fork`: they take no lock.
 Ref<const Certificate> FindRecentCertificate(const std::uint8_t *data, std::size_t length) noexcept;
 
-/// Keeps `certificate` in the place of another one, unless it is very long.
+/// Keeps `certificate`, unless it is very long. Another one may be released for it.
 void KeepRecentCertificate(const Ref<const Certificate> &certificate) noexcept;
 
 /// Releases all kept certificates, so that the next ones are decoded again. For tests.

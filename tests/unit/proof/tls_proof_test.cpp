@@ -36,7 +36,7 @@ TEST(VerifyTlsProof, AcceptsAnotherCertificateOfTheSameKey) {
   EXPECT_NO_THROW(VerifyTlsProof(token, *CertificateOf("tokens/sts-rsa-reissued")));
 }
 
-TEST(VerifyTlsProof, AcceptsKeysThatMakeNoSignaturesThatAreAccepted) {
+TEST(VerifyTlsProof, AcceptsKeysWithWhichNoSignatureIsAccepted) {
   const auto certificate = CertificateOf("crypto/ed25519");
   EXPECT_NO_THROW(VerifyTlsProof(TokenStandIn("_1", "<a/>", SamlToken::HOLDER_OF_KEY, certificate), *certificate));
 }

@@ -38,8 +38,8 @@ protected:
   ~VerifyingKey() override;
 };
 
-/// The key with this SubjectPublicKeyInfo, which must be in DER. Every key that OpenSSL knows can be read, also one with which
-/// no signature is accepted. This function and those below are safe on any thread.
+/// The key with this SubjectPublicKeyInfo, which must be in DER. Every key that OpenSSL knows can be read, including
+/// keys with which no signature is accepted. This function and those below are safe on any thread.
 /// @throws CryptoException when it cannot be decoded, is not in DER, or further bytes follow it; InvalidStateException,
 ///         OutOfMemoryException as in `CryptoException`, like the functions below.
 TARVEL_API Ref<const VerifyingKey> CreateVerifyingKey(const std::vector<std::uint8_t> &subjectPublicKeyInfo);
@@ -52,8 +52,8 @@ TARVEL_API Ref<const VerifyingKey> CreateVerifyingKey(const Ref<const Certificat
 /// @throws TypeMismatchException for a key that this library has not made; CryptoException when OpenSSL fails.
 TARVEL_API Ref<const VerifyingKey> CreateVerifyingKey(const PrivateKey &key);
 
-/// Whether both are the same key. Keys are compared, not their encodings. Keys of an algorithm that OpenSSL does not know are
-/// the same if their encodings are.
+/// Whether both are the same key. Keys are compared, not their encodings. Keys of an algorithm that OpenSSL does not
+/// know are the same if their encodings are.
 /// @throws TypeMismatchException for a key that this library has not made.
 TARVEL_API bool IsSameKey(const VerifyingKey &left, const VerifyingKey &right);
 
