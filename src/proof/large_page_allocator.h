@@ -43,7 +43,7 @@ public:
   }
 
 private:
-  // Only a wish: a failure changes nothing.
+  // A failure is ignored: without large pages, the array works the same.
   static void AskForLargePages(std::uintptr_t memory, std::size_t bytes) noexcept {
     constexpr std::uintptr_t LARGE_PAGE_BYTES = std::uintptr_t{2} << 20;
     const std::uintptr_t offset = (LARGE_PAGE_BYTES - memory % LARGE_PAGE_BYTES) % LARGE_PAGE_BYTES;

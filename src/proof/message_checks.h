@@ -65,7 +65,7 @@ void CheckTimestamp(const MessageRules &rules, CheckedMessage &message);
 void FindToken(const MessageRules &rules, CheckedMessage &message);
 
 /// Verifies the token, which must have been found. It stays null if it has no canonical form.
-/// @throws ParseException and InvalidSignatureException, whatever the sinks are, when the token is refused.
+/// @throws ParseException and InvalidSignatureException, even if the sinks do not throw, when the token is refused.
 void VerifyToken(const TokenVerifier &tokens, const MessageRules &rules, CheckedMessage &message);
 
 /// Checks that the sender has proved what the options require, with the token, which must not be null.

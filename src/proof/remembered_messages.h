@@ -66,8 +66,8 @@ private:
   Array<MessageIdentifier> m_identifiers;
   std::size_t m_count = 0;
   std::size_t m_sweep = 0; // the slot at which the next sweep begins
-  // The latest end of a time for which an identifier that was removed was remembered. Only after the clock was set back, it
-  // can be in the future.
+  // The latest end of a time for which an identifier that was removed was remembered. It can be in the
+  // future only after the clock was set back.
   std::int64_t m_forgottenUntil = std::numeric_limits<std::int64_t>::min();
 };
 

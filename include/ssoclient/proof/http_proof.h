@@ -30,7 +30,8 @@ struct HttpProofOptions {
   /// How far the clocks of sender and receiver may differ, in seconds; not negative.
   std::int64_t clockToleranceSec = 60;
 
-  /// A request that was signed longer ago is refused, whatever its `expires` says, in seconds; positive.
+  /// A request that was signed longer ago than this and the tolerance is refused, even if its `expires` is later. In
+  /// seconds; positive.
   std::int64_t maxAgeSec = 300;
 
   /// Refuses requests that were received before. Null for no guard.

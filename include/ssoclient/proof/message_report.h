@@ -26,7 +26,7 @@ struct MessageReport {
     WELL_FORMED = 0, ///< the text is a well-formed XML document within the limits
     ENVELOPE,        ///< it is a SOAP 1.1 or 1.2 envelope with one body, after at most one header
     SECURITY_HEADER, ///< there is exactly one WS-Security header for the role
-    TIMESTAMP,       ///< at most one timestamp, which can be read and whose time has come and has not passed
+    TIMESTAMP,       ///< at most one timestamp, which can be read, is not in the future and has not expired
     TOKEN,           ///< there is exactly one token, and the `TokenVerifier` accepts it
     PROOF,           ///< the sender proved possession of the token's key, if it is a holder-of-key token
     PARTS            ///< each part that must be covered is there once, and is covered

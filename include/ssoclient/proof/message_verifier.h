@@ -61,8 +61,9 @@ struct MessageVerifierOptions {
 /// An accepted message. Read the message from here, and from nowhere else: what was verified is what this tree contains.
 ///
 /// The token is verified. If the proof is MESSAGE_SIGNATURE, the covered elements are what the sender signed; nothing else
-/// in the message is. Comments are not signed, so ignore them: a text with a comment in between is one text. For other
-/// proofs nothing in the message is signed, and the message has the trust of the connection on which it was received.
+/// in the message is. Comments are usually not signed, so ignore them: a text with a comment in it is one text. For
+/// other proofs nothing in the message is signed, and the message has the trust of the connection on which it was
+/// received.
 struct VerifiedMessage {
   /// An element that the signature covers.
   struct CoveredElement {
@@ -105,8 +106,8 @@ public:
   ~MessageVerifier() = default;
 
   /// Verifies a message from a stranger: its form, the time, the token, the proof of the token's key, that the required
-  /// parts are the elements that a reader of the message finds, and that they are covered; at last, if it is signed, it asks
-  /// the replay guard. The exception is for the first of these that fails.
+  /// parts are the elements that a reader of the message finds, and that they are covered. Finally, if the message is
+  /// signed, it asks the replay guard. The exception is for the first of these that fails.
   /// @throws Tarvel::Xml::XMLParseException when the text is not a well-formed document.
   /// @throws InvalidMessageException when it is not an envelope with one body; when it does not have exactly one security
   ///         header for the role, with one token and at most one timestamp that can be read; when a signature in that header

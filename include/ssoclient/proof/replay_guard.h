@@ -30,7 +30,7 @@ public:
 
   /// Remembers the message, at least until `until`, and answers whether it was known. Both happen in one step: of several
   /// calls with one identifier at the same time, one is answered FIRST. It may block, for example on the network.
-  /// What it throws is reported as UNAVAILABLE.
+  /// If it throws, the message is refused with a `ReplayGuardException`.
   virtual Answer Remember(const MessageIdentifier &identifier, const Tarvel::System::DateTime &until) = 0;
 
 protected:

@@ -25,8 +25,8 @@ struct HttpSigningOptions {
   /// change these fields.
   std::vector<std::string> coveredHeaders;
 
-  /// The name of the signature among others: lower-case letters, digits and "_-.*", the first a letter or "*" (RFC 8941,
-  /// section 3.2).
+  /// The label by which the two fields refer to this signature: lower-case letters, digits and "_-.*", the first a
+  /// letter or "*" (RFC 8941, section 3.2).
   std::string label = "sso";
 
   /// The `nonce` parameter, printable ASCII. Two equal requests within one second differ only in it. Unset for a new random
@@ -54,7 +54,7 @@ struct HttpSigningOptions {
 ///         covered is missing, is there more than once, or is not ASCII; when the request has one of the new fields already;
 ///         and when an option does not have its form. Nothing is signed before these checks.
 /// @throws Tarvel::Crypto::CryptoException when OpenSSL or the provider of the key fails; Tarvel::InvalidStateException,
-///         Tarvel::OutOfMemoryException as described there.
+///         Tarvel::OutOfMemoryException as described at that class.
 SSOCLIENT_API std::vector<std::pair<std::string, std::string>>
 SignHttpRequest(const HttpRequest &request, const SamlToken &token, const Tarvel::Crypto::PrivateKey &identity,
                 const HttpSigningOptions &options = {});

@@ -24,7 +24,7 @@ namespace SsoClient {
 /// The default lifetime of a message, in seconds.
 constexpr std::int64_t DEFAULT_MESSAGE_LIFETIME_SEC = 300;
 
-/// `SignMessage` signs at most so many header blocks, in addition to body, timestamp and token.
+/// `SignMessage` signs at most this many header blocks, in addition to body, timestamp and token.
 constexpr std::size_t MAX_SIGNED_PARTS = 7;
 
 /// How the WS-Security header is written.
@@ -57,13 +57,13 @@ struct SecurityHeaderOptions {
 /// @throws InvalidMessageException when the message is not an envelope of SOAP 1.1 or 1.2 with one body, after at most one
 ///         header, and nothing else; has two security headers for the role, or two timestamps in it; has an element with an
 ///         identifier of the token, for example because the token is attached already; has a signature that covers the
-///         header that would change, the SOAP header, the envelope or the document, or of which this cannot be found out
-///         (a reference that does not resolve to one element by `wsu:Id`, `Id`, `ID` or `xml:id`, a transform other than
-///         canonicalisation, enveloped signature and STR-Transform); or declares a prefix that the token's signature lists
-///         in an `InclusiveNamespaces` and the token does not declare.
+///         header that would change, the SOAP header, the envelope or the document, or for which this cannot be
+///         determined (a reference that does not resolve to one element by `wsu:Id`, `Id`, `ID` or `xml:id`, a
+///         transform other than canonicalisation, enveloped signature and STR-Transform); or declares a prefix that the
+///         token's signature lists in an `InclusiveNamespaces` and the token does not declare.
 /// @throws Tarvel::InvalidArgumentException when the token is a holder-of-key token; when its signature would not be valid in
 ///         any message, because it uses inclusive canonicalisation or refers to its whole document; when the lifetime is not
-///         positive; or when the role contains a character that XML 1.0 cannot carry.
+///         positive; or when the role contains a character that XML 1.0 does not allow.
 /// @throws Tarvel::Xml::XMLParseException when the message is not well-formed or above a limit of the parser.
 /// @throws Tarvel::OutOfMemoryException or std::bad_alloc when memory runs out.
 ///
@@ -77,16 +77,16 @@ SSOCLIENT_API void AttachToken(Tarvel::Xml::Document &envelope, const SamlToken 
                                const SecurityHeaderOptions &options = {});
 
 /// Attaches a holder-of-key token to a message, like `AttachToken`, and signs the body, the timestamp, the header blocks
-/// `parts` and the token, in this order, with the token's key. The signature is XML Signature with exclusive canonicalisation and SHA-256 digests. Its
-/// algorithm is RSA-SHA256, or ECDSA with SHA-256, SHA-384 or SHA-512 for a key on P-256, P-384 or P-521. It refers to the
-/// key by the token's identifier. What is not signed is not protected: neither other header blocks nor the other content of
-/// the security header.
+/// `parts` and the token, in this order, with the token's key. The signature is XML Signature with exclusive
+/// canonicalisation and SHA-256 digests. Its algorithm is RSA-SHA256, or ECDSA with SHA-256, SHA-384 or SHA-512 for a
+/// key on P-256, P-384 or P-521. It refers to the key by the token's identifier. What is not signed is not protected:
+/// neither other header blocks nor the other content of the security header.
 ///
 /// An element that is signed keeps the identifier that it has (the first of `wsu:Id`, `Id`, `ID` and `xml:id`). Otherwise it gets
 /// a `wsu:Id`.
 ///
 /// @param identity the private key of the token
-/// @param parts at most `MAX_SIGNED_PARTS`, each there exactly once, whatever its role
+/// @param parts at most `MAX_SIGNED_PARTS`, each exactly once in the message; its role does not matter
 /// @throws InvalidMessageException when `AttachToken` throws it; when one of `parts` is missing or is there twice; and when the
 ///         body or a part needs an identifier, which would change what a signature inside of it signs.
 /// @throws Tarvel::InvalidArgumentException when the token is a bearer token, or its key is one with which no signature is
@@ -94,8 +94,8 @@ SSOCLIENT_API void AttachToken(Tarvel::Xml::Document &envelope, const SamlToken 
 ///         the security header; and for the same tokens and options as `AttachToken`.
 /// @throws Tarvel::Crypto::KeyMismatchException when `identity` is not the key of the token.
 /// @throws Tarvel::Xml::Security::XmlSecurityException when the key fails to sign, the identifier of an element to sign
-///         is there twice or is not usable, or the message has no canonical form.
-/// @throws Tarvel::Crypto::CryptoException when OpenSSL fails, and what else `AttachToken` throws.
+///         occurs twice or is not usable, or the message has no canonical form.
+/// @throws Tarvel::Crypto::CryptoException when OpenSSL fails, and everything else that `AttachToken` throws.
 ///
 /// Safe on any thread.
 SSOCLIENT_API std::string SignMessage(const std::string &envelope, const SamlToken &token,

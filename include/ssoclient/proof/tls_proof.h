@@ -14,12 +14,13 @@ namespace SsoClient {
 /// Checks that the sender of a holder-of-key token has its key: the key of `peerCertificate`, with which the sender
 /// authenticated in the TLS handshake, is the key of the token. The keys are compared, not the certificates, so neither dates
 /// nor issuer of `peerCertificate` matter here. Safe on any thread.
-/// @param token a token that is verified; made by this library, or with a certificate
-/// @param peerCertificate from the handshake that is complete, and not from a header that a sender can write
+/// @param token a verified token. If this library has not made it, it must have a certificate.
+/// @param peerCertificate from the completed handshake, and not from a header that a sender can write
 /// @throws InvalidProofException when it is another key.
 /// @throws Tarvel::InvalidArgumentException for a bearer token.
 /// @throws Tarvel::TypeMismatchException for a certificate that this library has not made.
-/// @throws Tarvel::OutOfMemoryException and Tarvel::InvalidStateException as in `Tarvel::Crypto::CryptoException`.
+/// @throws Tarvel::OutOfMemoryException and Tarvel::InvalidStateException as described at
+///         `Tarvel::Crypto::CryptoException`.
 SSOCLIENT_API void VerifyTlsProof(const SamlToken &token, const Tarvel::Crypto::Certificate &peerCertificate);
 
 } // namespace SsoClient
