@@ -20,7 +20,7 @@ namespace SsoClient {
 struct AccessTokenOptions {
   boost::optional<std::string> scope;    ///< scopes with one blank between two of them (RFC 6749, section 3.3)
   boost::optional<std::string> clientId; ///< of a client that does not authenticate otherwise (RFC 6749, section 3.2.1)
-  std::vector<std::string> resources; ///< absolute URIs without fragments: what the access token is for (RFC 8707)
+  std::vector<std::string> resources;    ///< absolute URIs without fragments: what the access token is for (RFC 8707)
 };
 
 /// A request for an access token. It is built and not sent. Both members are secret, because they contain the token; their
