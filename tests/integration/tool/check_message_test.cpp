@@ -107,15 +107,15 @@ TEST_F(CheckMessage, AcceptsTheCertificateOfTheTlsConnectionAsProof) {
                 "--peer-cert other-client.pem");
 }
 
-TEST_F(CheckMessage, RequiresThatTheTokenIsSignedOnlyIfDemanded) {
+TEST_F(CheckMessage, RequiresThatTheTokenIsSignedOnlyIfAsked) {
   const std::string message = Sign();
   EXPECT_EQ(0, Check(message, "--require-signed-token").exitCode);
   const std::string begin = "<ds:Reference URI=\"#" + Between(message, "#SAMLID\">", "<") + "\">";
   const std::string end = "</ds:Reference>";
   const std::size_t reference = message.rfind(begin);
   ASSERT_NE(std::string::npos, reference);
-  m_folder.Write("template.xml", message.substr(0, reference) +
-                                     message.substr(message.find(end, reference) + end.size()));
+  m_folder.Write("template.xml",
+                 message.substr(0, reference) + message.substr(message.find(end, reference) + end.size()));
   const Result result = Run("xmlsec1 --sign --privkey-pem client.key --id-attr:Id Timestamp --id-attr:Id Body "
                             "--node-xpath \"//*[local-name()='Security']/*[local-name()='Signature']\" template.xml");
   ASSERT_EQ(0, result.exitCode) << result.err;
@@ -154,7 +154,7 @@ TEST_F(CheckMessage, RefusesStaleMessages) {
 }
 
 // The time of the message is in the window of both options, and outside of it without them.
-TEST_F(CheckMessage, AsksForTheTimeWithinBothOptions) {
+TEST_F(CheckMessage, AppliesTheToleranceAndTheLongestAge) {
   const std::string message = Sign("--token bearer.xml envelope.xml");
   const auto shifted = [&](int seconds) {
     const Tarvel::System::DateTime created(Between(message, "<wsu:Created>", "<"));

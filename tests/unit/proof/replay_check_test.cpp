@@ -73,7 +73,7 @@ private:
 constexpr MessageIdentifier IDENTIFIER{1, 2, 3};
 const DateTime UNTIL("2026-01-01T00:06:00Z");
 
-TEST(RequireFirstReceipt, GivesTheGuardTheIdentifierAndTheTime) {
+TEST(RequireFirstReceipt, PassesTheIdentifierAndTheTimeToTheGuard) {
   AnsweringGuard guard(ReplayGuard::Answer::FIRST);
   RequireFirstReceipt(guard, IDENTIFIER, UNTIL);
   EXPECT_EQ(IDENTIFIER, guard.lastIdentifier);
