@@ -69,8 +69,8 @@ void FindToken(const MessageRules &rules, CheckedMessage &message);
 void VerifyToken(const TokenVerifier &tokens, const MessageRules &rules, CheckedMessage &message);
 
 /// Checks that the sender has proved what the options require, with the token, which must not be null.
-/// @throws Tarvel::TypeMismatchException for a peer certificate that this library has not made, and what OpenSSL's failures
-///         become.
+/// @throws Tarvel::TypeMismatchException for a peer certificate that this library has not made, and the
+///         exceptions of OpenSSL's failures.
 void CheckProof(const Tarvel::Xml::Document &document, const MessageRules &rules, CheckedMessage &message);
 
 /// Checks that each part that must be covered is there once and, if the proof is a signature, that it is covered.

@@ -24,7 +24,7 @@ struct MessageTimestamp {
 };
 
 /// Reads the timestamp that is a child of `security`. It must have a creation time, may have an end, which must be later, and
-/// must have nothing else. Texts with a comment in between are refused, because a comment could cut off a part of them.
+/// must have nothing else. Texts with a comment in them are refused, because a comment could cut off a part of them.
 MessageTimestamp ReadTimestamp(const Tarvel::Xml::ElementNode &security, bool isRequired, DeviationSink &sink);
 
 /// Checks what could be read of `timestamp` against this machine's clock.

@@ -23,7 +23,8 @@ const Tarvel::Xml::ElementNode *FindProofSignature(const Tarvel::Xml::ElementNod
                                                    const Tarvel::Crypto::VerifyingKey *key, DeviationSink &sink);
 
 /// Verifies the signature with the token's key. Returns what it covers; empty if it is refused.
-/// @throws Tarvel::OutOfMemoryException and Tarvel::InvalidStateException, which are no verdict.
+/// @throws Tarvel::OutOfMemoryException and Tarvel::InvalidStateException, which say nothing about the
+///         message.
 boost::optional<Tarvel::Xml::Security::Signature::Coverage>
 VerifyProofSignature(const Tarvel::Xml::ElementNode &signature, const Tarvel::Crypto::VerifyingKey &key,
                      DeviationSink &sink);

@@ -46,7 +46,7 @@ struct SoapEnvelope {
   const Tarvel::Xml::ElementNode *body = nullptr;    ///< the first body; null if there is none
 };
 
-/// The envelope that `element`, a document element, is. Null is not an envelope.
+/// Reads `element`, a document element, as an envelope. Null is not an envelope.
 SoapEnvelope ReadEnvelope(const Tarvel::Xml::ElementNode *element) noexcept;
 
 /// The elements that a search has found, in document order. At most one is right for every search here.

@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// `TokenElement`, the assertion of a token that is added to a message of others.
+/// `TokenElement`, the assertion of a token that is added to a message.
 
 #pragma once
 
