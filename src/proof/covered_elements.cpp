@@ -18,18 +18,16 @@ using Tarvel::Xml::AsElement;
 using Tarvel::Xml::ElementNode;
 using Tarvel::Xml::Node;
 
-/// Adds the element, unless it is there. If two references have it as their target, and one of them does not omit the
-/// signature, the whole element is covered.
+/// Adds the element, unless it is there. All references to an element that contains the signature omit it: no signature
+/// contains the digest of itself.
 void Add(std::vector<CoveredElement> &covered, const ElementNode *element, const ElementNode *omitted) {
-  const auto same = std::find_if(covered.begin(), covered.end(),
-                                 [element](const CoveredElement &one) { return one.element == element; });
-  if (same == covered.end()) {
+  const bool isThere = std::any_of(covered.begin(), covered.end(),
+                                   [element](const CoveredElement &one) { return one.element == element; });
+  if (!isThere) {
     CoveredElement added;
     added.element = element;
     added.omitted = omitted;
     covered.push_back(std::move(added));
-  } else if (!omitted) {
-    same->omitted = nullptr;
   }
 }
 

@@ -70,7 +70,7 @@ void RequireFieldValue(const std::string &name, std::string_view value) {
   for (std::size_t position = 0; position < value.size(); ++position) {
     const std::size_t fold = FoldLength(value, position);
     if (fold == 0 && IsForbiddenInField(value[position])) {
-      throw InvalidMessageException("The header field " + name + " contains a control character");
+      throw InvalidMessageException("The header field " + StringUtil::Shorten(name) + " contains a control character");
     }
     position += fold > 0 ? fold - 1 : 0;
   }

@@ -13,6 +13,7 @@ namespace SsoClient {
 
 namespace {
 
+using Tarvel::StringUtil;
 using Tarvel::Crypto::HashAlgorithm;
 
 constexpr unsigned BITS_OF_P256 = 256;
@@ -32,19 +33,19 @@ const StructuredMember *FindMember(const std::vector<StructuredMember> &members,
 HttpSignature MakeSignature(const StructuredMember &input, const StructuredMember &value) {
   const auto *const list = std::get_if<StructuredInnerList>(&input.value);
   if (!list) {
-    throw InvalidMessageException("Signature-Input has no list for the label " + input.key);
+    throw InvalidMessageException("Signature-Input has no list for the label " + StringUtil::Shorten(input.key));
   }
   const auto *const item = std::get_if<StructuredItem>(&value.value);
   const auto *const octets = item ? std::get_if<std::vector<std::uint8_t>>(&item->value) : nullptr;
   if (!octets) {
-    throw InvalidMessageException("Signature has no octets for the label " + value.key);
+    throw InvalidMessageException("Signature has no octets for the label " + StringUtil::Shorten(value.key));
   }
   return {input.key, *list, *octets};
 }
 
 /// The text of a component in a message.
 std::string Quote(std::string_view name) {
-  return '"' + Tarvel::StringUtil::Shorten(name) + '"';
+  return '"' + StringUtil::Shorten(name) + '"';
 }
 
 std::string RequireComponent(const HttpComponents &components, const std::string &name) {
@@ -77,14 +78,16 @@ std::vector<HttpSignature> ReadHttpSignatures(const HttpComponents &components) 
   const std::vector<StructuredMember> values = ReadField(components, SIGNATURE_FIELD, "Signature");
   for (const StructuredMember &value : values) {
     if (!FindMember(inputs, value.key)) {
-      throw InvalidMessageException("Signature has the label " + value.key + ", which Signature-Input does not have");
+      throw InvalidMessageException("Signature has the label " + StringUtil::Shorten(value.key) +
+                                    ", which Signature-Input does not have");
     }
   }
   std::vector<HttpSignature> signatures;
   for (const StructuredMember &input : inputs) {
     const StructuredMember *const value = FindMember(values, input.key);
     if (!value) {
-      throw InvalidMessageException("Signature-Input has the label " + input.key + ", which Signature does not have");
+      throw InvalidMessageException("Signature-Input has the label " + StringUtil::Shorten(input.key) +
+                                    ", which Signature does not have");
     }
     signatures.push_back(MakeSignature(input, *value));
   }
@@ -116,7 +119,7 @@ std::vector<std::string> ReadComponentNames(const StructuredInnerList &input) {
     }
     if (!item.parameters.empty()) {
       throw InvalidMessageException("The signature covers the component " + Quote(*name) + " with the parameter " +
-                                    item.parameters.front().key + ", which is not supported");
+                                    StringUtil::Shorten(item.parameters.front().key) + ", which is not supported");
     }
     if (std::find(names.begin(), names.end(), *name) != names.end()) {
       throw InvalidMessageException("The signature covers the component " + Quote(*name) + " twice");

@@ -135,6 +135,7 @@ bool HasKey(const ElementNode &keyInfo, const VerifyingKey &key) {
 } // namespace
 
 KeyReferral FindKeyReferral(const ElementNode &signature, const SamlToken &token, const VerifyingKey *key) {
+  bool isKeyRead = false;
   return JoinChildren(signature, [&](const ElementNode &keyInfo) {
     if (!keyInfo.HasQName(Namespaces::DS, "KeyInfo")) {
       return KeyReferral::NOTHING;
@@ -151,7 +152,10 @@ KeyReferral FindKeyReferral(const ElementNode &signature, const SamlToken &token
     if (!statesKey) {
       return referral;
     }
-    return Join(referral, key && HasKey(keyInfo, *key) ? KeyReferral::TOKEN : KeyReferral::OTHER_KEY);
+    // Keys take long to read. A stranger can write tens of thousands of ds:KeyInfo, but no right signature has two of them.
+    const bool isTokenKey = key && !isKeyRead && HasKey(keyInfo, *key);
+    isKeyRead = true;
+    return Join(referral, isTokenKey ? KeyReferral::TOKEN : KeyReferral::OTHER_KEY);
   });
 }
 

@@ -4,12 +4,11 @@
 
 #pragma once
 
+#include <tarvel/core/large_pages.h>
+
 #include <cstddef>
-#include <cstdint>
 #include <limits>
 #include <new>
-
-#include <sys/mman.h>
 
 namespace SsoClient {
 
@@ -31,7 +30,7 @@ public:
       throw std::bad_array_new_length();
     }
     void *const memory = ::operator new(count * sizeof(T));
-    AskForLargePages(reinterpret_cast<std::uintptr_t>(memory), count * sizeof(T));
+    Tarvel::AskForLargePages(memory, count * sizeof(T));
     return static_cast<T *>(memory);
   }
 
@@ -40,17 +39,6 @@ public:
   template <typename U>
   bool operator==(const LargePageAllocator<U> &) const noexcept {
     return true;
-  }
-
-private:
-  // A failure is ignored: without large pages, the array works the same.
-  static void AskForLargePages(std::uintptr_t memory, std::size_t bytes) noexcept {
-    constexpr std::uintptr_t LARGE_PAGE_BYTES = std::uintptr_t{2} << 20;
-    const std::uintptr_t offset = (LARGE_PAGE_BYTES - memory % LARGE_PAGE_BYTES) % LARGE_PAGE_BYTES;
-    if (bytes >= offset + LARGE_PAGE_BYTES) {
-      const std::uintptr_t whole = (bytes - offset) / LARGE_PAGE_BYTES * LARGE_PAGE_BYTES;
-      madvise(reinterpret_cast<void *>(memory + offset), whole, MADV_HUGEPAGE);
-    }
   }
 };
 

@@ -50,20 +50,8 @@ ReplayProtection GuardAgainstReplay(const CheckedMessage &message, const Message
   return ReplayProtection::GUARDED;
 }
 
-} // namespace
-
-struct MessageVerifier::State {
-  State(const TokenVerifier &tokenVerifier, const MessageVerifierOptions &verifierOptions)
-      : tokens(tokenVerifier), options(Consistent(verifierOptions)) {}
-
-  VerifiedMessage Verify(const Ref<const Document> &document, const Certificate *peerCertificate) const;
-
-  const TokenVerifier tokens;
-  const MessageVerifierOptions options;
-};
-
-VerifiedMessage MessageVerifier::State::Verify(const Ref<const Document> &document,
-                                               const Certificate *peerCertificate) const {
+VerifiedMessage VerifyDocument(const Ref<const Document> &document, const Certificate *peerCertificate,
+                               const TokenVerifier &tokens, const MessageVerifierOptions &options) {
   const MessageRules rules{options, peerCertificate, ThrowingMessageSinks()};
   CheckedMessage message;
   CheckEnvelope(*document, rules, message);
@@ -86,6 +74,16 @@ VerifiedMessage MessageVerifier::State::Verify(const Ref<const Document> &docume
   return verified;
 }
 
+} // namespace
+
+struct MessageVerifier::State {
+  State(const TokenVerifier &tokenVerifier, const MessageVerifierOptions &verifierOptions)
+      : tokens(tokenVerifier), options(Consistent(verifierOptions)) {}
+
+  const TokenVerifier tokens;
+  const MessageVerifierOptions options;
+};
+
 bool VerifiedMessage::IsCovered(const Tarvel::Xml::ElementNode &element) const noexcept {
   return IsCoveredBy(covered, element);
 }
@@ -100,14 +98,14 @@ VerifiedMessage MessageVerifier::Verify(const std::string &message) const {
 VerifiedMessage MessageVerifier::Verify(const std::string &message, const Certificate *peerCertificate) const {
   Ref<Document> document;
   ParseXML(message, document);
-  return m_state->Verify(document, peerCertificate);
+  return VerifyDocument(document, peerCertificate, m_state->tokens, m_state->options);
 }
 
 VerifiedMessage MessageVerifier::Verify(const Ref<const Document> &message, const Certificate *peerCertificate) const {
   if (!message) {
     throw InvalidArgumentException("there is no message to verify");
   }
-  return m_state->Verify(message, peerCertificate);
+  return VerifyDocument(message, peerCertificate, m_state->tokens, m_state->options);
 }
 
 MessageReport MessageVerifier::Explain(const std::string &message) const {

@@ -4,6 +4,7 @@
 #include "proof/structured_fields.h"
 
 #include <ssoclient/proof/exceptions.h>
+#include <tarvel/core/string_util.h>
 
 #include <algorithm>
 #include <charconv>
@@ -133,7 +134,7 @@ std::vector<StructuredMember> FieldReader::ReadMembers() {
     StructuredMember member = ReadMember();
     for (const StructuredMember &earlier : members) {
       if (earlier.key == member.key) {
-        Refuse("the key " + member.key + " appears twice");
+        Refuse("the key " + Tarvel::StringUtil::Shorten(member.key) + " appears twice");
       }
     }
     members.push_back(std::move(member));
@@ -194,7 +195,7 @@ std::vector<StructuredParameter> FieldReader::ReadParameters() {
     SkipAll(BLANK);
     StructuredParameter parameter{ReadKey(), true};
     if (FindParameter(parameters, parameter.key)) {
-      Refuse("the parameter " + parameter.key + " appears twice");
+      Refuse("the parameter " + Tarvel::StringUtil::Shorten(parameter.key) + " appears twice");
     }
     if (Skip('=')) {
       parameter.value = ReadBareItem();

@@ -3,6 +3,8 @@
 #include "proof/token_field.h"
 
 #include "proof/base64_form.h"
+#include "proof/content_digest.h"
+#include "proof/http_signature.h"
 
 #include <ssoclient/proof/exceptions.h>
 #include <tarvel/core/exception.h>
@@ -28,6 +30,12 @@ bool IsPrintable(const std::string &text) noexcept {
 void RequireTokenHeader(const TokenHeader &form) {
   if (!IsHttpToken(form.name)) {
     throw Tarvel::InvalidArgumentException("TokenHeader::name is not the name of a header field");
+  }
+  // Other parts of the proof are in these fields.
+  const std::string name = FieldNameInLowerCase(form.name);
+  if (name == SIGNATURE_INPUT_FIELD || name == SIGNATURE_FIELD || name == CONTENT_DIGEST) {
+    throw Tarvel::InvalidArgumentException(
+        "TokenHeader::name must not be Signature, Signature-Input or Content-Digest");
   }
   if (!IsPrintable(form.before) || !IsPrintable(form.after)) {
     throw Tarvel::InvalidArgumentException("TokenHeader::before and TokenHeader::after must be printable ASCII");

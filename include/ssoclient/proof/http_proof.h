@@ -61,6 +61,8 @@ struct VerifiedHttpRequest {
 ///   must be at least one. An unset body is treated as empty.
 /// - It must have `created`. `expires` is checked if it is there. Unknown parameters are ignored; like all parameters, they are
 ///   signed.
+/// - Several fields of one name are covered as one value, in which they are joined by a comma and a blank (RFC 9421, section 2.1).
+///   So one field with such a comma can arrive as two: read all fields of a name, or refuse a request with two of them.
 /// - Components with parameters (such as ";sf"), unknown derived components, names in upper case and repeated components are
 ///   refused, and so are header fields with control characters. Folded lines are read as one line.
 /// - At most 32 signatures, 128 components and 32 parameters are read.

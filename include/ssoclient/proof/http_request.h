@@ -47,7 +47,9 @@ struct TokenHeader {
     BASE64URL   ///< RFC 4648, section 5, without padding
   };
 
-  std::string name = "Authorization";   ///< of the field; letter case does not matter
+  /// Of the field; letter case does not matter. Not Signature, Signature-Input or Content-Digest, where the proof is.
+  std::string name = "Authorization";
+
   std::string before = "SAML ";         ///< before the encoded token; printable ASCII, compared octet by octet
   std::string after;                    ///< after the encoded token; printable ASCII, compared octet by octet
   Encoding encoding = Encoding::BASE64; ///< of the token

@@ -61,9 +61,9 @@ struct MessageVerifierOptions {
 /// An accepted message. Read the message from here, and from nowhere else: what was verified is what this tree contains.
 ///
 /// The token is verified. If the proof is MESSAGE_SIGNATURE, the covered elements are what the sender signed; nothing else
-/// in the message is. Comments are usually not signed, so ignore them: a text with a comment in it is one text. For
-/// other proofs nothing in the message is signed, and the message has the trust of the connection on which it was
-/// received.
+/// in the message is. Comments are usually not signed, so ignore them: a text with a comment in it is one text. A prefix
+/// in a value, such as that of `xsi:type`, is signed, but usually not the namespace to which it is bound. For other proofs
+/// nothing in the message is signed, and the message has the trust of the connection on which it was received.
 struct VerifiedMessage {
   /// An element that the signature covers.
   struct CoveredElement {

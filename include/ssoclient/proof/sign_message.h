@@ -78,9 +78,9 @@ SSOCLIENT_API void AttachToken(Tarvel::Xml::Document &envelope, const SamlToken 
 
 /// Attaches a holder-of-key token to a message, like `AttachToken`, and signs the body, the timestamp, the header blocks
 /// `parts` and the token, in this order, with the token's key. The signature is XML Signature with exclusive
-/// canonicalisation and SHA-256 digests. Its algorithm is RSA-SHA256, or ECDSA with SHA-256, SHA-384 or SHA-512 for a
-/// key on P-256, P-384 or P-521. It refers to the key by the token's identifier. What is not signed is not protected:
-/// neither other header blocks nor the other content of the security header.
+/// canonicalisation and SHA-256 digests. Its algorithm is RSA-SHA256, or ECDSA with SHA-256, SHA-384 or SHA-512 for a key
+/// on P-256, P-384 or P-521. It refers to the key by the token's identifier. What is not signed is not protected: other
+/// header blocks, the other content of the security header, and the declaration of a prefix that only a value uses.
 ///
 /// An element that is signed keeps the identifier that it has (the first of `wsu:Id`, `Id`, `ID` and `xml:id`). Otherwise it gets
 /// a `wsu:Id`.
@@ -95,7 +95,9 @@ SSOCLIENT_API void AttachToken(Tarvel::Xml::Document &envelope, const SamlToken 
 /// @throws Tarvel::Crypto::KeyMismatchException when `identity` is not the key of the token.
 /// @throws Tarvel::Xml::Security::XmlSecurityException when the key fails to sign, the identifier of an element to sign
 ///         occurs twice or is not usable, or the message has no canonical form.
-/// @throws Tarvel::Crypto::CryptoException when OpenSSL fails, and everything else that `AttachToken` throws.
+/// @throws Tarvel::TypeMismatchException for a private key, or a token with a certificate, that this library has not made.
+/// @throws Tarvel::Crypto::CryptoException when OpenSSL fails; Tarvel::InvalidStateException at the end of the process; and
+///         everything else that `AttachToken` throws.
 ///
 /// Safe on any thread.
 SSOCLIENT_API std::string SignMessage(const std::string &envelope, const SamlToken &token,

@@ -13,7 +13,7 @@ namespace SsoClient {
 
 /// Checks that the sender of a holder-of-key token has its key: the key of `peerCertificate`, with which the sender
 /// authenticated in the TLS handshake, is the key of the token. The keys are compared, not the certificates, so neither dates
-/// nor issuer of `peerCertificate` matter here. Safe on any thread.
+/// nor issuer of `peerCertificate` matter here. The TLS server decides how strong the key must be. Safe on any thread.
 /// @param token a verified token. If this library has not made it, it must have a certificate.
 /// @param peerCertificate from the completed handshake, and not from a header that a sender can write
 /// @throws InvalidProofException when it is another key.

@@ -195,11 +195,13 @@ Ref<const PrivateKey> LoadPrivateKey(const std::string &pathOrUri, const Passphr
 }
 
 void RequireKeyMatchesCertificate(const PrivateKey &key, const Certificate &certificate) {
+  const PrivateKeyImpl &privateKey = AsImpl(key);
+  EVP_PKEY *const publicKey = AsImpl(certificate).GetNativeKey();
+  const ProviderTurn turn(privateKey.IsInAddedProvider());
   const OpenSslGuard guard;
   guard.Require();
   const OpenSslErrorScope errors;
-  EVP_PKEY *const publicKey = AsImpl(certificate).GetNativeKey();
-  if (!publicKey || EVP_PKEY_eq(publicKey, AsImpl(key).GetNative()) != 1) {
+  if (!publicKey || EVP_PKEY_eq(publicKey, privateKey.GetNative()) != 1) {
     errors.RequireMemory();
     throw KeyMismatchException("The private key does not belong to the certificate " +
                                StringUtil::Shorten(certificate.GetSubject()));

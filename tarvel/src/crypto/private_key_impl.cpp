@@ -48,11 +48,11 @@ Ref<const VerifyingKey> PrivateKeyImpl::GetPublicKey() const {
   if (const VerifyingKey *const kept = m_publicKey.load(std::memory_order_acquire)) {
     return Ref<const VerifyingKey>(kept);
   }
-  const OpenSslGuard guard;
-  guard.Require();
-  const OpenSslErrorScope errors;
   const auto der = [&] {
     const ProviderTurn turn(m_isInAddedProvider);
+    const OpenSslGuard guard;
+    guard.Require();
+    const OpenSslErrorScope errors;
     return EncodeDer<const EVP_PKEY *>(i2d_PUBKEY, m_native.get(), errors);
   }();
   Ref<const VerifyingKey> made = CreateVerifyingKey(der);

@@ -213,14 +213,14 @@ bool VerifyDigest(const PreparedKey &key, SignatureScheme scheme, DigestAlgorith
 
 std::vector<std::uint8_t> SignDigest(const PrivateKey &key, SignatureScheme scheme, DigestAlgorithm algorithm,
                                      const std::uint8_t *digest) {
-  const OpenSslGuard guard;
-  guard.Require();
-  const OpenSslErrorScope errors;
   if (key.GetAlgorithm() != (IsRsaScheme(scheme) ? "RSA" : "EC")) {
     throw CryptoException("A key of algorithm " + key.GetAlgorithm() + " cannot make a signature of this scheme");
   }
   const PrivateKeyImpl &impl = AsImpl(key);
-  const ProviderTurn turn(impl.IsInAddedProvider());
+  const ProviderTurn turn(impl.IsInAddedProvider()); // before the guard: OpenSSL's clean-up does not wait for a queue
+  const OpenSslGuard guard;
+  guard.Require();
+  const OpenSslErrorScope errors;
   KeyContexts &contexts = impl.GetSignContexts();
   KeyContextHandle context = contexts.Acquire(scheme, algorithm);
   if (!context) {

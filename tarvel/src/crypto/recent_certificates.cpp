@@ -32,7 +32,7 @@ Place &PlaceOf(const std::uint8_t *data, std::size_t length) noexcept {
 
 Ref<const Certificate> Take(Place &place) noexcept {
   const Certificate *const certificate = place.exchange(nullptr, std::memory_order_acquire);
-  const Ref<const Certificate> taken(certificate);
+  Ref<const Certificate> taken(certificate);
   if (certificate) {
     certificate->Release(); // the reference of the place; `taken` has another one
   }
@@ -71,6 +71,12 @@ void KeepRecentCertificate(const Ref<const Certificate> &certificate) noexcept {
     Place &place = PlaceOf(der.data(), der.size());
     Take(place);
     Put(place, certificate);
+  }
+}
+
+void ForgetRecentCertificates() noexcept {
+  for (Place &place : places) {
+    Take(place);
   }
 }
 

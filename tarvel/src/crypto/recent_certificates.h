@@ -23,4 +23,7 @@ Ref<const Certificate> FindRecentCertificate(const std::uint8_t *data, std::size
 /// Keeps `certificate` in the place of another one, unless it is very long.
 void KeepRecentCertificate(const Ref<const Certificate> &certificate) noexcept;
 
+/// Releases all kept certificates, so that the next ones are decoded again. For tests.
+void ForgetRecentCertificates() noexcept;
+
 } // namespace Tarvel::Crypto

@@ -4,6 +4,7 @@
 #include "judged_message.h"
 #include "message_files.h"
 
+#include "support/data_file.h"
 #include "support/fixed_environment.h"
 #include "support/repetitions.h"
 
@@ -69,6 +70,26 @@ TEST(HostileHeader, IsExplainedInLinearTime) {
     const double whole = SecondsOf(receiver, Repeated(content, large));
     EXPECT_LT(whole, 8 * 3 * small + 0.5) << content.before << content.piece;
   }
+}
+
+/// A `ds:KeyInfo` with a key on P-384, which takes long to read.
+std::string KeyInfoWithKey() {
+  const std::string token = Testing::ReadDataFile("saml2/holder-ec384-value.xml");
+  const std::string end = "</ds:KeyValue>";
+  const std::size_t begin = token.find("<ds:KeyValue");
+  return "<ds:KeyInfo>" + token.substr(begin, token.find(end, begin) + end.size() - begin) + "</ds:KeyInfo>";
+}
+
+TEST(HostileSignature, HasAtMostOneKeyRead) {
+  const Testing::FixedEnvironment clock;
+  const Receiver receiver = MakeReceiver("");
+  const char *const before = "</ds:Signature></wsse:Security>";
+  const std::string withKey = KeyInfoWithKey();
+  const std::string withName =
+      "<ds:KeyInfo><ds:KeyName>" + std::string(withKey.size(), 'x') + "</ds:KeyName></ds:KeyInfo>";
+  const double names = SecondsOf(receiver, Repeated({before, withName.c_str()}, SIXTEEN_MEBIBYTES / 8));
+  const double keys = SecondsOf(receiver, Repeated({before, withKey.c_str()}, SIXTEEN_MEBIBYTES / 8));
+  EXPECT_LT(keys, 10 * names + 0.1);
 }
 
 } // namespace

@@ -2,6 +2,8 @@
 
 #include "integration/out_of_memory/failing_heap.h"
 
+#include "crypto/recent_certificates.h"
+
 #include "support/refused_memory.h"
 
 #include <limits>
@@ -28,6 +30,7 @@ bool IsMemoryRefused() noexcept {
 }
 
 FailingHeap::FailingHeap(long allocations, Shortage shortage) noexcept {
+  Tarvel::Crypto::ForgetRecentCertificates(); // so that decoding certificates can fail, too
   t_hasFailed = false;
   t_shortage = shortage;
   t_allocationsLeft = allocations;

@@ -2,6 +2,8 @@
 
 #include "integration/out_of_memory/failing_memory.h"
 
+#include "crypto/recent_certificates.h"
+
 #include <atomic>
 #include <cerrno>
 #include <cstdlib>
@@ -73,6 +75,7 @@ FailingMemory::FailingMemory(int number, Shortage shortage) {
   if (!IS_INSTALLED) {
     std::abort();
   }
+  Tarvel::Crypto::ForgetRecentCertificates(); // so that decoding certificates can fail, too
   g_hasFailed = false;
   g_keepsFailing = shortage == Shortage::FROM_THEN;
   g_left = number;

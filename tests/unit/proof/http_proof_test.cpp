@@ -233,6 +233,11 @@ TEST_F(VerifyHttpProofTest, RefusesOptionsThatAreNotValid) {
   options.tokenHeader.name = "";
   ExpectRefusal<Tarvel::InvalidArgumentException>(
       request, "Invalid argument : TokenHeader::name is not the name of a header field");
+  for (const char *const name : {"Signature", "signature-input", "Content-digest"}) {
+    options.tokenHeader.name = name;
+    ExpectRefusal<Tarvel::InvalidArgumentException>(
+        request, "Invalid argument : TokenHeader::name must not be Signature, Signature-Input or Content-Digest");
+  }
   options.tokenHeader = {};
   options.tokenHeader.before = "a\n";
   ExpectRefusal<Tarvel::InvalidArgumentException>(
@@ -305,6 +310,17 @@ TEST_F(VerifyHttpProofTest, RefusesAHostileHeader) {
   ExpectRefusal<InvalidMessageException>(request, "The header fields of the request have more than 1048576 octets");
   request.headers.back() = {"Signature-Input", "a=(" + std::string(500'000, ' ') + ")"};
   ExpectRefusal<InvalidMessageException>(request, "Signature-Input has the label a, which Signature does not have");
+  const std::string key(500'000, 'k');
+  const std::string quoted = std::string(1024, 'k') + "... (498976 more bytes)";
+  request.headers.back() = {"Signature-Input", key + "=()"};
+  ExpectRefusal<InvalidMessageException>(request,
+                                         "Signature-Input has the label " + quoted + ", which Signature does not have");
+  request.headers.back() = {"Signature-Input", "a=();" + key + ";" + key};
+  ExpectRefusal<InvalidMessageException>(
+      request,
+      "The header field Signature-Input is malformed at character 1000199: the parameter " + quoted + " appears twice");
+  request.headers.back() = {key, "\n"};
+  ExpectRefusal<InvalidMessageException>(request, "The header field " + quoted + " contains a control character");
   request.headers.back() = {"Signature-Input", "a=\"" + std::string(500'000, '\\') + "\""};
   EXPECT_THROW(Verify(request), InvalidMessageException);
 }

@@ -92,6 +92,14 @@ TEST(SignHttpRequest, HasTheFormOfTheOptions) {
   EXPECT_NE(fields[1].second.find(";alg=\"ecdsa-p384-sha384\""), std::string::npos);
 }
 
+TEST(SignHttpRequest, SignsTheDigestOfEmptyContent) {
+  HttpRequest request = POST_REQUEST;
+  request.body = "";
+  const Fields fields = SignHttpRequest(request, HolderToken(), *Key());
+  EXPECT_EQ(fields.at(1), (std::pair<std::string, std::string>(
+                              "Content-Digest", "sha-256=:47DEQpj8HBSa+/TImW+5JCeuQeRkm5NMpJWZG3hSuFU=:")));
+}
+
 TEST(SignHttpRequest, UsesANewNonceEachTime) {
   EXPECT_NE(SignHttpRequest(POST_REQUEST, HolderToken(), *Key())[2],
             SignHttpRequest(POST_REQUEST, HolderToken(), *Key())[2]);

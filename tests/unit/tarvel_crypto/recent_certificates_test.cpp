@@ -20,6 +20,7 @@ using Tarvel::Ref;
 using Tarvel::Crypto::Certificate;
 using Tarvel::Crypto::CreateCertificateFromDer;
 using Tarvel::Crypto::FindRecentCertificate;
+using Tarvel::Crypto::ForgetRecentCertificates;
 using Octets = std::vector<std::uint8_t>;
 
 Octets DerOf(const std::string &name) {
@@ -44,6 +45,15 @@ TEST(RecentCertificates, DoNotContainOneThatDiffersInOneOctet) {
   EXPECT_FALSE(FindRecentCertificate(der.data(), der.size() - 1));
   EXPECT_FALSE(FindRecentCertificate(der.data() + 1, der.size() - 1));
   EXPECT_FALSE(FindRecentCertificate(nullptr, 0));
+}
+
+TEST(RecentCertificates, AreForgotten) {
+  const Octets der = DerOf("crypto/p256.crt");
+  const Ref<const Certificate> first = CreateCertificateFromDer(der.data(), der.size());
+  ForgetRecentCertificates();
+  EXPECT_FALSE(FindRecentCertificate(der.data(), der.size()));
+  EXPECT_EQ(first->GetDer(), der); // an object that is in use stays valid
+  EXPECT_NE(first, CreateCertificateFromDer(der.data(), der.size()));
 }
 
 TEST(RecentCertificates, DoNotContainWhatDoesNotDecode) {
