@@ -148,7 +148,7 @@ Tarvel::System::DateTime At(std::int64_t microseconds) {
 void Expect(SsoClient::ReplayGuard &guard, std::uint64_t message, std::int64_t until,
             SsoClient::ReplayGuard::Answer answer) {
   if (guard.Remember(MakeIdentifier(message), At(until)) != answer) {
-    throw std::runtime_error("the replay guard gives another answer");
+    throw std::runtime_error("the replay guard returns another answer");
   }
 }
 

@@ -60,7 +60,7 @@ Response Refuse(http::status status, const std::string &text, const std::excepti
 Notes::Notes(const Tarvel::Crypto::CertificateList &trusted, const std::string &origin, std::size_t remembered)
     : m_origin(origin), m_tokens(trusted, TokenOptions(origin)), m_options(ProofOptions(remembered)) {}
 
-/// What the library verifies. The address is that of the configuration: the header `Host` is what the sender wrote.
+/// What the library verifies. The address is that of the configuration, because the sender writes the header `Host`.
 SsoClient::HttpRequest Notes::ToProve(const Request &request) const {
   SsoClient::HttpRequest result;
   result.method = std::string(request.method_string());

@@ -17,7 +17,7 @@ namespace {
 
 enum ExitCode { DONE = 0, FAILED = 1, USAGE = 2 };
 
-// How many requests it remembers at once: those of five minutes, and each takes less than 100 bytes.
+// How many requests it remembers at once. Each takes less than 100 bytes, and is remembered for at most seven minutes.
 constexpr std::size_t REMEMBERED = 100'000;
 
 } // namespace

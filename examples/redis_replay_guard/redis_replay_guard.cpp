@@ -36,7 +36,7 @@ int ParsePort(const std::string &text) {
   }
 }
 
-// SET with NX sets the key only if it does not exist, in one step: the server answers OK, or else nil.
+// SET with NX sets the key only if it does not exist, in one step: the server answers OK, or nil if the key exists.
 Answer ReadAnswer(const redisReply &reply) {
   if (reply.type == REDIS_REPLY_STATUS && std::string(reply.str, reply.len) == "OK") {
     return Answer::FIRST;
@@ -71,8 +71,8 @@ Answer RedisReplayGuard::Remember(const SsoClient::MessageIdentifier &identifier
   }
   const std::string milliseconds = std::to_string(remaining / MICROSECONDS_PER_MILLISECOND + 1);
   const std::string key = KeyOf(identifier);
-  // An idle connection may have ended, for example because the server was restarted. If its command has been executed in spite
-  // of that, the second answer is REPEATED: a message is refused, and never accepted twice.
+  // An idle connection may have ended, for example because the server was restarted. If its command has still been
+  // executed, the second answer is REPEATED: a message is refused, and never accepted twice.
   for (bool isIdle : {true, false}) {
     Connection connection = isIdle ? FindIdle() : Connect();
     const Reply reply(connection ? static_cast<redisReply *>(redisCommand(connection.get(), "SET %s 1 NX PX %s",

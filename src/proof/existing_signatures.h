@@ -27,7 +27,7 @@ public:
                      const std::set<std::string, std::less<>> &newIdentifiers);
 
   /// @throws InvalidMessageException when a signature covers one of `elements`, or the whole document, or what it
-  ///         covers cannot be found out.
+  ///         covers cannot be determined.
   void RequireUncovered(const std::vector<const Tarvel::Xml::ElementNode *> &elements) const;
 
   /// @throws InvalidMessageException when a new declaration of `prefix` at `element` would change what a signature

@@ -70,7 +70,8 @@ void RememberedMessages::Sweep(std::int64_t now) noexcept {
   }
 }
 
-// Closes the gap: a search ends at an empty slot, so an identifier after it that was displaced over it is moved into it.
+// Closes the gap: a search ends at an empty slot, so a later identifier that belongs at or before the gap is moved
+// into it.
 void RememberedMessages::Remove(std::size_t slot) noexcept {
   m_forgottenUntil = std::max(m_forgottenUntil, m_untils[slot]);
   std::size_t gap = slot;

@@ -31,7 +31,7 @@ MessageIdentifier IdentifyMessage(std::string_view signedAs, const std::vector<s
 /// Asks the guard whether the message is received for the first time. Call it last, when every other check has passed,
 /// so that a message that is refused takes no place in the guard.
 /// @param until the first moment at which the message is stale
-/// @throws RepeatedMessageException when the guard knows the message.
+/// @throws RepeatedMessageException when the guard has received the message before.
 /// @throws ReplayGuardException when it is not available, or throws.
 void RequireFirstReceipt(ReplayGuard &guard, const MessageIdentifier &identifier,
                          const Tarvel::System::DateTime &until);

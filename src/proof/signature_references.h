@@ -42,7 +42,7 @@ struct ContextOfForm {
 struct SignatureReference {
   const Tarvel::Xml::ElementNode *element = nullptr;
   const Tarvel::Xml::Attribute *uri = nullptr; ///< null if it is not stated
-  ContextOfForm context;                       ///< without a canonicalisation, XML Signature demands the inclusive one
+  ContextOfForm context;                       ///< without a canonicalisation, XML Signature requires the inclusive one
   bool isTransformed = false; ///< has a transform that can select or make other content, such as XPath and XSLT
 
   /// The identifier in a reference "#x". Empty for every other reference.

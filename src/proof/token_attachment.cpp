@@ -24,7 +24,7 @@ using Tarvel::Ref;
 using Tarvel::StringUtil;
 using Tarvel::Xml::ElementNode;
 
-/// Searches find elements that are const. Those of a message that gets a token may be changed.
+/// Searches return const elements. Those of a message that gets a token may be changed.
 ElementNode *MayChange(const ElementNode *element) noexcept {
   return const_cast<ElementNode *>(element);
 }

@@ -60,7 +60,8 @@ bool LacksIpV6(const boost::system::system_error &failure) {
 void AskForCertificates(asio::ssl::context &tls) {
   tls.set_verify_mode(asio::ssl::verify_peer);
   tls.set_verify_callback([](bool, asio::ssl::verify_context &) { return true; });
-  constexpr std::string_view SESSIONS = "devsts"; // OpenSSL resumes no authenticated session without a context
+  // Without a context, OpenSSL resumes no session with a client certificate.
+  constexpr std::string_view SESSIONS = "devsts";
   SSL_CTX_set_session_id_context(tls.native_handle(), reinterpret_cast<const unsigned char *>(SESSIONS.data()),
                                  static_cast<unsigned>(SESSIONS.size()));
 }

@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// The checks of a message whose sender must prove that the token in it is the sender's.
+/// The checks of a message whose sender must prove that it may use the token.
 
 #pragma once
 
@@ -17,7 +17,7 @@
 
 namespace DevSts {
 
-/// The address of this service in a token's audience; also its namespace.
+/// The address of this service in a token's audience. Its namespace is the same.
 constexpr const char *ECHO_AUDIENCE = Ns::ECHO.uri;
 
 enum class Proof {

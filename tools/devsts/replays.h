@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// The messages that were accepted, so that none is accepted twice.
+/// The messages that were accepted, so that no message is accepted twice.
 
 #pragma once
 

@@ -50,9 +50,9 @@ struct SignatureReference {
 /// preceded by "enveloped".
 std::vector<SignatureReference> ReadReferences(const xmlNode &signature);
 
-/// The canonical form of `ds:SignedInfo`, if the signature's value, checked with `key` for every `KeyInfo`, and all
-/// digests are right; otherwise none. Call it after `RegisterIdentifiers` for the document and a successful
-/// `ReadReferences`.
+/// The canonical form of `ds:SignedInfo`, if the signature's value and all digests are right; otherwise nullopt. The
+/// value is checked with `key`, for every `KeyInfo`. Call it after `RegisterIdentifiers` for the document and a
+/// successful `ReadReferences`.
 std::optional<std::vector<unsigned char>> VerifiedSignedInfo(xmlNode &signature, const SignatureKey &key);
 
 /// Whether the signature verifies, under the same conditions.

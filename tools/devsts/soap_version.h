@@ -14,7 +14,7 @@ struct SoapVersion {
   Namespace ns;
   const char *name;
   std::string_view mediaType;
-  const char *roleAttribute; ///< names the receiver of a header block
+  const char *roleAttribute; ///< states the receiver of a header block
 };
 
 inline bool operator==(const SoapVersion &left, const SoapVersion &right) {

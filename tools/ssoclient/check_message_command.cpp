@@ -137,7 +137,8 @@ void AddDemands(CLI::App &app, CheckMessageOptions &options) {
       .ShowDefault()
       .TypeName("S")
       .Group(GROUP);
-  AddOption(app, "--max-age", options.maxAgeSec, "Refuse a message that was created more seconds ago")
+  AddOption(app, "--max-age", options.maxAgeSec,
+            "Refuse a message that was created more seconds ago, in addition to the tolerance")
       .Within(1, MOST_SECONDS)
       .ShowDefault()
       .TypeName("S")

@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 /// @file
-/// The header blocks and the receiver that a command line names, of a SOAP message.
+/// The options of a command line for a SOAP message: its header blocks and its receiver.
 
 #pragma once
 

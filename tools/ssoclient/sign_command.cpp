@@ -57,7 +57,7 @@ void CheckCommandLine(const SignOptions &options) {
   }
 }
 
-/// A token is used as what it is: a bearer token is attached, and a holder-of-key token is attached and signed with.
+/// A bearer token can only be attached. With a holder-of-key token, its key must sign the message.
 void CheckUse(const SamlToken &token, const SignOptions &options) {
   const bool isBearer = token.GetConfirmationMethod() == SamlToken::BEARER;
   if (!isBearer && !options.key.HasKey()) {
@@ -101,13 +101,13 @@ ExitCode Sign(const SignOptions &options, const OutputOptions &output) {
 
 void AddMessageOptions(CLI::App &app, SignOptions &options) {
   AddMessagePartsOptions(app, options.message,
-                         "Header block to sign, in addition to the body and the timestamp; may be repeated");
+                         "Header block to sign, in addition to body, timestamp and token; may be repeated");
   AddOption(app, "--lifetime", options.lifetime, "How long the message is valid, such as 90s or 5m")
       .ShowDefault()
       .TypeName("TIME")
       .Group(GROUP);
   AddOption(app, "--token-type-reference", options.reference,
-            "How the signature names the type of the token: \"standard\" is the published spelling")
+            "How the signature spells the type of the token: \"standard\" is the published spelling")
       .OneOf({ESTABLISHED_REFERENCE, STANDARD_REFERENCE})
       .ShowDefault()
       .TypeName("NAME")

@@ -26,7 +26,7 @@ struct HttpRequest {
   std::string method; ///< such as "POST"; letter case matters
 
   /// The absolute http or https URI of the target, without a fragment and without user information: what the client
-  /// asked for. A service takes scheme and authority from its own configuration if it can, not from the request. The
+  /// asked for. A service should use scheme and authority of its own configuration, not of the request. The
   /// URI is signed as it is written, so the client must sign what the service will see.
   std::string targetUri;
 

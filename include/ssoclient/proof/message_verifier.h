@@ -64,7 +64,7 @@ struct MessageVerifierOptions {
 /// contains.
 ///
 /// The token is verified. If the proof is MESSAGE_SIGNATURE, the covered elements are what the sender signed; nothing
-/// else in the message was signed. Comments are not signed, so ignore them: a text with a comment in between is one
+/// else in the message was signed. Comments are usually not signed, so ignore them: a text with a comment in it is one
 /// text. A prefix in a value, such as that of `xsi:type`, is signed, but usually not the namespace to which it is
 /// bound. With another proof nothing in the message is signed, so trust the message only as far as the connection that
 /// delivered it.

@@ -17,10 +17,10 @@ enum class ProofKind : std::int32_t {
   TLS_CERTIFICATE    ///< that it has the token's key: it authenticated the connection with it
 };
 
-/// Whether a replay of what was verified would be noticed.
+/// Whether a replay guard has accepted the message or request.
 enum class ReplayProtection : std::int32_t {
   NOT_GUARDED = 0, ///< there is no replay guard, or nothing was signed
-  GUARDED          ///< the replay guard has received this message for the first time
+  GUARDED          ///< the replay guard has received it for the first time
 };
 
 /// The name of a proof: "bearer", "message-signature" or "tls-certificate".

@@ -65,7 +65,7 @@ struct SecurityHeaderOptions {
 ///         token's signature lists in an `InclusiveNamespaces` and the token does not declare.
 /// @throws Tarvel::InvalidArgumentException when the token is a holder-of-key token; when its signature would not be
 ///         valid in any message, because it uses inclusive canonicalisation or refers to its whole document; when the
-///         lifetime is not positive; or when the role contains a character that XML 1.0 cannot carry.
+///         lifetime is not positive; or when the role contains a character that XML 1.0 does not allow.
 /// @throws Tarvel::Xml::XMLParseException when the message is not well-formed or above a limit of the parser.
 /// @throws Tarvel::OutOfMemoryException or std::bad_alloc when memory runs out.
 ///
@@ -82,8 +82,8 @@ SSOCLIENT_API void AttachToken(Tarvel::Xml::Document &envelope, const SamlToken 
 /// blocks `parts` and the token, in this order, with the token's key. The signature is XML Signature with exclusive
 /// canonicalisation and SHA-256 digests. Its algorithm is RSA-SHA256, or ECDSA with SHA-256, SHA-384 or SHA-512 for a
 /// key on P-256, P-384 or P-521. It refers to the key by the token's identifier. What is not signed is not protected:
-/// neither other header blocks, nor the other content of the security header, nor the declaration of a prefix that only
-/// a value uses.
+/// other header blocks, the other content of the security header, and the declaration of a prefix that only a value
+/// uses.
 ///
 /// An element that is signed keeps the identifier that it has (the first of `wsu:Id`, `Id`, `ID` and `xml:id`).
 /// Otherwise it gets a `wsu:Id`.
@@ -98,11 +98,11 @@ SSOCLIENT_API void AttachToken(Tarvel::Xml::Document &envelope, const SamlToken 
 ///         no local name, or is the security header; and for the same tokens and options as `AttachToken`.
 /// @throws Tarvel::Crypto::KeyMismatchException when `identity` is not the key of the token.
 /// @throws Tarvel::Xml::Security::XmlSecurityException when the key fails to sign, the identifier of an element to sign
-///         is there twice or is not usable, or the message has no canonical form.
+///         occurs twice or is not usable, or the message has no canonical form.
 /// @throws Tarvel::TypeMismatchException for a private key, or a token with a certificate, that this library has not
 ///         made.
 /// @throws Tarvel::Crypto::CryptoException when OpenSSL fails; Tarvel::InvalidStateException at the end of the
-///         process; and what else `AttachToken` throws.
+///         process; and everything else that `AttachToken` throws.
 ///
 /// Safe on any thread.
 SSOCLIENT_API std::string SignMessage(const std::string &envelope, const SamlToken &token,

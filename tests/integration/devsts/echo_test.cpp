@@ -114,7 +114,7 @@ TEST_F(Echo, RefusesAMessageThatItHasReceivedBefore) {
   EXPECT_EQ(SendSigned().status, 200);
 }
 
-TEST_F(Echo, ARefusedMessageIsNotRemembered) {
+TEST_F(Echo, DoesNotRememberARefusedMessage) {
   const std::string text = m_message.Sign(m_service);
   EXPECT_TRUE(IsRefused(Send(Replaced(text, ">7<", ">8<")), "wsse:FailedCheck", WRONG_SIGNATURE));
   EXPECT_EQ(Send(text).status, 200);
@@ -268,7 +268,7 @@ TEST_F(EchoBearer, AcceptsABearerToken) {
                         "a bearer token has no key that could have signed the message"));
 }
 
-TEST_F(EchoBearer, StillWantsProofForAHolderOfKeyToken) {
+TEST_F(EchoBearer, StillRequiresTheProofOfAHolderOfKeyToken) {
   EXPECT_TRUE(IsRefused(Send(m_message.Write()), "wsse:FailedCheck", NO_PROOF));
 }
 
@@ -290,7 +290,7 @@ TEST_F(EchoOverMutualTls, AcceptsTheCertificateOfTheTokenAsProof) {
   EXPECT_TRUE(IsRefused(Send(m_message.Write()), "wsse:FailedCheck", NO_PROOF));
 }
 
-TEST_F(EchoOverMutualTls, ChecksASignatureNevertheless) {
+TEST_F(EchoOverMutualTls, StillChecksASignature) {
   EXPECT_EQ(SendAs("other-client", m_message.Sign(m_service)).body,
             EchoOf(m_message, m_token, "client@corp.example", "message-signature"));
   EXPECT_TRUE(

@@ -107,7 +107,7 @@ TEST_F(CheckMessage, AcceptsTheCertificateOfTheTlsConnectionAsProof) {
                 "--peer-cert other-client.pem");
 }
 
-TEST_F(CheckMessage, RequiresThatTheTokenIsSignedOnlyIfDemanded) {
+TEST_F(CheckMessage, RequiresThatTheTokenIsSignedOnlyIfAsked) {
   const std::string message = Sign();
   EXPECT_EQ(0, Check(message, "--require-signed-token").exitCode);
   const std::string begin = "<ds:Reference URI=\"#" + Between(message, "#SAMLID\">", "<") + "\">";
@@ -154,7 +154,7 @@ TEST_F(CheckMessage, RefusesStaleMessages) {
 }
 
 // The time of the message is in the window of both options, and outside of it without them.
-TEST_F(CheckMessage, AsksForTheTimeWithinBothOptions) {
+TEST_F(CheckMessage, AppliesTheToleranceAndTheLongestAge) {
   const std::string message = Sign("--token bearer.xml envelope.xml");
   const auto shifted = [&](int seconds) {
     const Tarvel::System::DateTime created(Between(message, "<wsu:Created>", "<"));

@@ -166,7 +166,7 @@ TEST_F(SignCommand, RefusesAKeyThatIsNotTheTokens) {
                "ssoclient: key: The private key does not belong to the certificate CN=client,O=corp.example\n");
 }
 
-TEST_F(SignCommand, UsesATokenAsWhatItIs) {
+TEST_F(SignCommand, UsesTheKeyOfAHolderOfKeyTokenOnly) {
   ExpectResult(Run(std::string(WITH_TOKEN) + "envelope.xml"), 2, "",
                "ssoclient: usage: the token is bound to a key, which must sign the message; give --key or --p12\n");
   ExpectResult(Run("ssoclient sign --token bearer.xml --key client.key envelope.xml"), 2, "",

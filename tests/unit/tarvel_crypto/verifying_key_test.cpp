@@ -140,7 +140,7 @@ TEST(IsSameKey, ComparesKeysAndNotEncodings) {
   EXPECT_NE(compressed->GetSha256Thumbprint(), CreateVerifyingKey(ReadKeyInfo("p256"))->GetSha256Thumbprint());
 }
 
-TEST(IsSameKey, TellsEveryPairOfKeysApart) {
+TEST(IsSameKey, DistinguishesEveryPairOfKeys) {
   for (const ExpectedKey &left : KEYS) {
     for (const ExpectedKey &right : KEYS) {
       EXPECT_EQ(IsSameKey(*CreateVerifyingKey(ReadKeyInfo(left.name)), *CreateVerifyingKey(ReadKeyInfo(right.name))),
