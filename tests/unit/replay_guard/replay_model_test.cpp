@@ -104,8 +104,8 @@ TEST_P(ReplayModel, AnswersLikeTheGuard) {
 INSTANTIATE_TEST_SUITE_P(With, ReplayModel,
                          ::testing::Values(Setting{1, 3, 4, false}, Setting{2, 5, 8, false}, Setting{3, 10, 9, true},
                                            Setting{6, 30, 15, false}, Setting{13, 60, 40, true},
-                                           Setting{60, 300, 120, false}, Setting{200, 900, 500, true},
-                                           Setting{500, 1500, 1400, false}),
+                                           Setting{60, 300, 120, false}, Setting{100, 400, 250, true},
+                                           Setting{150, 500, 420, false}),
                          [](const auto &setting) {
                            return std::to_string(setting.param.capacity) + "Places" +
                                   (setting.param.isClockChanged ? "AndAChangingClock" : "");
