@@ -10,6 +10,7 @@
 #include <libxml/uri.h>
 
 #include <memory>
+#include <optional>
 #include <stdexcept>
 #include <string_view>
 #include <vector>
@@ -62,6 +63,13 @@ const xmlNode *BodyOf(xmlDoc &document) {
   return xmlLastElementChild(xmlDocGetRootElement(&document));
 }
 
+bool IsOrContains(const xmlNode *element, const xmlNode *other) {
+  while (other && other != element) {
+    other = other->parent;
+  }
+  return other != nullptr;
+}
+
 bool IsAbsolute(const std::string &uri) {
   const Uri parsed(xmlParseURI(uri.c_str()));
   return parsed && parsed->scheme;
@@ -83,10 +91,17 @@ void MakeNamespaceNamesAbsolute(xmlNode *top) {
   }
 }
 
-std::string CanonicalForm(xmlDoc &document, const xmlNode *apex) {
+/// The canonical form of what `covered` covers, by libxml2; nullopt if the document of libxml2 has no such element. An element
+/// that contains the signature is covered without it.
+std::optional<std::string> CanonicalForm(xmlDoc &document, const VerifiedMessage::CoveredElement &covered) {
+  const xmlNode *const element = FindAt(document, PositionOf(*covered.element));
+  const xmlNode *const omitted = covered.omitted ? FindAt(document, PositionOf(*covered.omitted)) : nullptr;
+  if (!element || (covered.omitted && !omitted)) {
+    return std::nullopt;
+  }
   Testing::OracleMethod method;
   method.isExclusive = true;
-  return Testing::CanonicalFormOfLibxml2(document, apex, nullptr, method);
+  return Testing::CanonicalFormOfLibxml2(document, element, omitted, method);
 }
 
 } // namespace
@@ -99,9 +114,7 @@ SignedElements::SignedElements() {
     const Decision decision = Judge(MakeReceiver(file.options), file.xml);
     const Testing::XmlDocHandle document = Testing::ParseWithLibxml2(file.xml);
     for (const VerifiedMessage::CoveredElement &covered : decision.message.value().covered) {
-      if (!covered.omitted) {
-        m_canonicalForms.insert(CanonicalForm(*document, FindAt(*document, PositionOf(*covered.element))));
-      }
+      m_canonicalForms.insert(CanonicalForm(*document, covered).value());
     }
   }
   if (m_canonicalForms.size() < 5) {
@@ -117,11 +130,11 @@ std::string SignedElements::FindFault(const std::string &xml, const VerifiedMess
   MakeNamespaceNamesAbsolute(document->children);
   bool isBodyCovered = false;
   for (const VerifiedMessage::CoveredElement &covered : message.covered) {
-    const xmlNode *const element = FindAt(*document, PositionOf(*covered.element));
-    if (covered.omitted || !element || m_canonicalForms.count(CanonicalForm(*document, element)) == 0) {
+    const std::optional<std::string> form = CanonicalForm(*document, covered);
+    if (!form || m_canonicalForms.count(*form) == 0) {
       return covered.path + " was not signed";
     }
-    isBodyCovered = isBodyCovered || element == BodyOf(*document);
+    isBodyCovered = isBodyCovered || IsOrContains(FindAt(*document, PositionOf(*covered.element)), BodyOf(*document));
   }
   return isBodyCovered ? "" : "the body is not covered";
 }

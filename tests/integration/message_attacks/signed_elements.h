@@ -14,7 +14,7 @@ namespace Messages {
 /// The canonical forms of the elements that senders have signed.
 class SignedElements {
 public:
-  /// Those of all genuine messages whose signature covers elements that do not contain the signature.
+  /// Those of all genuine messages. An element that contains the signature is signed without it.
   SignedElements();
 
   /// What is wrong with an accepted message: a covered element was never signed by a sender with this content, or the body
