@@ -14,6 +14,7 @@
 #include <cstdint>
 #include <memory>
 #include <random>
+#include <set>
 
 namespace ReplayGuardTest {
 namespace {
@@ -71,6 +72,19 @@ TEST(RememberedMessages, FindsAnIdentifierWhoseHashBeginsWithZeros) {
   const auto place = messages.Prepare(identifier);
   EXPECT_EQ(messages.Remember(place, 2, 1), SsoClient::ReplayGuard::Answer::FIRST);
   EXPECT_EQ(messages.Remember(place, 2, 1), SsoClient::ReplayGuard::Answer::REPEATED);
+}
+
+// Among so many identifiers, several pairs have the same tag of 32 bits.
+TEST(RememberedMessages, ComparesTheWholeHash) {
+  constexpr std::uint64_t IDENTIFIERS = 300'000;
+  SsoClient::RememberedMessages messages(IDENTIFIERS, {1, 2});
+  std::set<std::uint32_t> tags;
+  for (std::uint64_t i = 0; i < IDENTIFIERS; ++i) {
+    const auto place = messages.Prepare(MakeIdentifier(i));
+    tags.insert(place.tag);
+    ASSERT_EQ(messages.Remember(place, 2, 1), SsoClient::ReplayGuard::Answer::FIRST) << i;
+  }
+  EXPECT_LT(tags.size(), IDENTIFIERS);
 }
 
 } // namespace
