@@ -35,7 +35,7 @@ public:
     const std::int64_t now = Tarvel::System::GetUtcDateTime().GetUtcTime();
     const RememberedMessages::Place place = m_messages.Prepare(identifier);
     const std::lock_guard<Tarvel::ForkSafeMutex> lock(m_mutex);
-    return m_messages.Remember(place, identifier, until.GetUtcTime(), now);
+    return m_messages.Remember(place, until.GetUtcTime(), now);
   }
 
 private:

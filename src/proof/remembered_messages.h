@@ -19,6 +19,10 @@ namespace SsoClient {
 /// Identifiers, each with the time until which it is remembered. For one thread at a time. Times are microseconds
 /// since 1970, UTC.
 ///
+/// Of an identifier, the table contains 96 bits of a hash with a secret key. So it always finds an identifier that it
+/// contains. Among a million, it confuses another one with one of them with a probability of 2 to the power of -76, which
+/// no sender can increase.
+///
 /// It is a hash table with linear probing: an identifier is in the slot that its tag decides, or after it if that slot
 /// was not empty. Each call of `Remember` first sweeps: it takes `SWEPT_SLOTS` steps, so no call takes long. A step
 /// examines one slot, and removes its identifier if it has expired. A removal closes the gap, and moves no identifier
@@ -28,15 +32,16 @@ namespace SsoClient {
 /// round that removes D identifiers takes slots + D steps, so it has at most A = (slots + D) / SWEPT_SLOTS calls, which
 /// add at most A identifiers. If D is at least slots / (SWEPT_SLOTS - 1), then A is at most D, and there are not more
 /// identifiers than before the round. Otherwise A is less than slots / (SWEPT_SLOTS - 1), which is less than a fifth of
-/// the capacity, because there are 5/4 slots for each identifier. After such a round, the table contains only these and
+/// the capacity, because there are 3/2 slots for each identifier. After such a round, the table contains only these and
 /// identifiers that have not expired in the round: less than 1/5 + 4/5 of the capacity. The two further slots matter
-/// for capacities up to 13 only: there A is at most 2, and counting shows the same.
+/// for capacities up to 20 only: a test of each of them shows the same.
 class RememberedMessages {
 public:
-  /// Where the search for an identifier begins.
+  /// What the table contains of an identifier, and where the search for it begins.
   struct Place {
-    std::uint32_t tag = 0; ///< never 0
-    std::size_t slot = 0;  ///< the first slot of the search
+    std::uint32_t tag = 0;   ///< never 0
+    std::uint64_t check = 0; ///< the other half of the hash
+    std::size_t slot = 0;    ///< the first slot of the search
   };
 
   /// An empty table, with all memory that it will ever use.
@@ -49,11 +54,10 @@ public:
   Place Prepare(const MessageIdentifier &identifier) const noexcept;
 
   /// Remembers the identifier, whose place is `place`, if it is not known.
-  ReplayGuard::Answer Remember(const Place &place, const MessageIdentifier &identifier, std::int64_t until,
-                               std::int64_t now) noexcept;
+  ReplayGuard::Answer Remember(const Place &place, std::int64_t until, std::int64_t now) noexcept;
 
 private:
-  static constexpr std::size_t SWEPT_SLOTS = 8;
+  static constexpr std::size_t SWEPT_SLOTS = 9;
 
   std::size_t SlotOf(std::uint32_t tag) const noexcept;
   std::size_t After(std::size_t slot) const noexcept { return slot + 1 == m_tags.size() ? 0 : slot + 1; }
@@ -64,11 +68,14 @@ private:
   const std::size_t m_capacity;
   const SipHashKey m_key;
   // One element for each slot. The arrays are separate so that a search touches little memory.
+  struct Rest {
+    std::int64_t until = 0;
+    std::uint64_t check = 0;
+  };
   template <typename T>
   using Array = std::vector<T, LargePageAllocator<T>>;
   Array<std::uint32_t> m_tags; // 0 in an empty slot
-  Array<std::int64_t> m_untils;
-  Array<MessageIdentifier> m_identifiers;
+  Array<Rest> m_rests;
   std::size_t m_count = 0;
   std::size_t m_sweep = 0; // the slot at which the next sweep begins
   // The latest `until` of all identifiers that were removed. It is in the future only after the clock was set back.

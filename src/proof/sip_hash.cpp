@@ -12,6 +12,10 @@ namespace {
 constexpr std::size_t WORD_BYTES = 8;
 constexpr int BITS_PER_BYTE = 8;
 
+// The hash of 128 bits differs from that of 64 by these numbers.
+constexpr std::uint64_t LONG_HASH_MARK = 0xee;
+constexpr std::uint64_t SECOND_HALF_MARK = 0xdd;
+
 // The four words of state, and the numbers with which they begin: "somepseudorandomlygeneratedbytes".
 struct State {
   std::uint64_t v0 = 0x736f6d6570736575;
@@ -21,7 +25,7 @@ struct State {
 
   explicit State(const SipHashKey &key) noexcept {
     v0 ^= key.low;
-    v1 ^= key.high;
+    v1 ^= key.high ^ LONG_HASH_MARK;
     v2 ^= key.low;
     v3 ^= key.high;
   }
@@ -45,6 +49,13 @@ struct State {
     Round();
     v0 ^= word;
   }
+
+  std::uint64_t Finish() noexcept {
+    for (int i = 0; i < 4; ++i) {
+      Round();
+    }
+    return v0 ^ v1 ^ v2 ^ v3;
+  }
 };
 
 std::uint64_t ReadWord(const std::uint8_t *bytes) noexcept {
@@ -57,19 +68,19 @@ std::uint64_t ReadWord(const std::uint8_t *bytes) noexcept {
 
 } // namespace
 
-std::uint64_t ComputeSipHash(const SipHashKey &key, const MessageIdentifier &identifier) noexcept {
+SipHash ComputeSipHash(const SipHashKey &key, const MessageIdentifier &identifier) noexcept {
   constexpr int LENGTH_SHIFT = 56; // the last word has the length in its last octet, and here nothing else
-  constexpr std::uint64_t END_MARK = 0xff;
   State state(key);
   for (std::size_t i = 0; i < identifier.size(); i += WORD_BYTES) {
     state.Add(ReadWord(identifier.data() + i));
   }
   state.Add(static_cast<std::uint64_t>(identifier.size()) << LENGTH_SHIFT);
-  state.v2 ^= END_MARK;
-  for (int i = 0; i < 4; ++i) {
-    state.Round();
-  }
-  return state.v0 ^ state.v1 ^ state.v2 ^ state.v3;
+  state.v2 ^= LONG_HASH_MARK;
+  SipHash hash;
+  hash.first = state.Finish();
+  state.v1 ^= SECOND_HALF_MARK;
+  hash.second = state.Finish();
+  return hash;
 }
 
 } // namespace SsoClient

@@ -16,8 +16,14 @@ struct SipHashKey {
   std::uint64_t high = 0;
 };
 
-/// SipHash-2-4 of the 32 octets. Without the key, the values cannot be predicted, so a sender cannot choose
-/// identifiers with similar values.
-std::uint64_t ComputeSipHash(const SipHashKey &key, const MessageIdentifier &identifier) noexcept;
+/// The first and the last eight octets of a hash, each as a little-endian number.
+struct SipHash {
+  std::uint64_t first = 0;
+  std::uint64_t second = 0;
+};
+
+/// SipHash-2-4 of the 32 octets, with 128 bits. Without the key, the values cannot be predicted, so a sender cannot
+/// choose identifiers with equal or similar values.
+SipHash ComputeSipHash(const SipHashKey &key, const MessageIdentifier &identifier) noexcept;
 
 } // namespace SsoClient

@@ -49,8 +49,12 @@ constexpr std::size_t MAX_MEMORY_REPLAY_GUARD_CAPACITY = 100'000'000;
 /// Messages that have expired are removed gradually, a few in each call. While at most four fifths of `capacity` have
 /// not expired, a new message always has a place.
 ///
-/// It uses at most 56 bytes for each message of `capacity` and less than 1 KiB in addition, all of them from the
+/// It uses at most 32 bytes for each message of `capacity` and less than 1 KiB in addition, all of them from the
 /// beginning. A call never waits for many messages that expire at once.
+///
+/// It contains 96 bits of a hash of each identifier, with a secret key. So it never answers FIRST to a message that it
+/// knows. It answers REPEATED to a new message with a probability of less than 2 to the power of -69, however senders choose
+/// their messages.
 ///
 /// The clock is that of the machine. The guard also answers UNAVAILABLE to a message that it does not know, and
 /// remembers nothing, if `until` is not in the future. After the clock was set back, it does the same if `until` is not

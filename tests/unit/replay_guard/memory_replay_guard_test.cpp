@@ -99,7 +99,7 @@ TEST(MemoryReplayGuard, AnswersNoMessageFirstTwiceWhenTheClockIsSetForwardAndBac
 
 TEST(MemoryReplayGuard, RemovesOnlyAFewOfManyExpiredMessagesInACall) {
   constexpr std::uint64_t MESSAGES = 10'000;
-  constexpr int AT_MOST_REMOVED = 8;
+  constexpr int AT_MOST_REMOVED = 9;
   SetClock clock(NOW);
   const auto guard = CreateMemoryReplayGuard(2 * MESSAGES);
   for (std::uint64_t i = 0; i < MESSAGES; ++i) {
@@ -117,7 +117,11 @@ TEST(MemoryReplayGuard, RemovesOnlyAFewOfManyExpiredMessagesInACall) {
 }
 
 TEST(MemoryReplayGuard, HasAPlaceWhileFourFifthsHaveNotExpired) {
-  for (const std::int64_t capacity : {1, 2, 5, 6, 10, 13, 14, 15, 20, 100, 1000, 5'000}) {
+  std::vector<std::int64_t> capacities = {100, 1000, 5000};
+  for (std::int64_t small = 1; small <= 40; ++small) {
+    capacities.push_back(small);
+  }
+  for (const std::int64_t capacity : capacities) {
     SetClock clock(NOW);
     const auto guard = CreateMemoryReplayGuard(static_cast<std::size_t>(capacity));
     // In each microsecond one message arrives and one expires. Every tenth round, all of them expire at once.
