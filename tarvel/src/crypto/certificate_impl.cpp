@@ -5,6 +5,7 @@
 #include "crypto/library_context.h"
 #include "crypto/openssl_errors.h"
 #include "crypto/openssl_guard.h"
+#include "crypto/subject_public_key_der.h"
 #include "crypto/thumbprint.h"
 
 #include <tarvel/core/ref.h>
@@ -122,6 +123,7 @@ CertificateImpl::CertificateImpl(const std::uint8_t *data, std::size_t length)
     errors.RequireMemory();
   }
   m_key = MakeRef<PreparedKey>(std::move(key));
+  m_keyDer = EncodeDer<const X509_PUBKEY *>(i2d_X509_PUBKEY, X509_get_X509_PUBKEY(m_native.get()), errors);
 }
 
 std::string CertificateImpl::GetSubject() const {

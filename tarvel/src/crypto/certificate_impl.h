@@ -27,6 +27,8 @@ public:
 
   const PreparedKey &GetKey() const noexcept { return *m_key; }
   Ref<const PreparedKey> ShareKey() const noexcept { return m_key; }
+  /// The SubjectPublicKeyInfo in DER.
+  const std::vector<std::uint8_t> &GetKeyDer() const noexcept { return m_keyDer; }
 
   /// Owned by the certificate. The key is null when OpenSSL does not know its algorithm.
   X509 *GetNative() const noexcept { return m_native.get(); }
@@ -37,8 +39,9 @@ private:
 
   std::vector<std::uint8_t> m_der;
   CertificateHandle m_native;
-  Ref<const PreparedKey> m_key; // never null after construction
-  std::int64_t m_notBefore = 0; // microseconds since the epoch
+  Ref<const PreparedKey> m_key;       // never null after construction
+  std::vector<std::uint8_t> m_keyDer; // encoded once: each proof of a token's key needs it
+  std::int64_t m_notBefore = 0;       // microseconds since the epoch
   std::int64_t m_notAfter = 0;
 };
 

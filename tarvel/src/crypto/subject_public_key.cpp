@@ -128,11 +128,7 @@ SubjectPublicKey MakeEcPublicKey(NamedCurve curve, const std::vector<std::uint8_
 }
 
 std::vector<std::uint8_t> GetSubjectPublicKey(const Certificate &certificate) {
-  const CertificateImpl &impl = AsImpl(certificate);
-  const OpenSslGuard guard;
-  guard.Require();
-  const OpenSslErrorScope errors;
-  return EncodeDer<const X509_PUBKEY *>(i2d_X509_PUBKEY, X509_get_X509_PUBKEY(impl.GetNative()), errors);
+  return AsImpl(certificate).GetKeyDer();
 }
 
 bool HasPublicKey(const Certificate &certificate, const std::vector<std::uint8_t> &subjectPublicKeyInfo) {
