@@ -31,16 +31,28 @@ void Add(std::vector<CoveredElement> &covered, const ElementNode *element, const
   }
 }
 
-/// Sorts the elements by their places in the document. The walk ends at the last of them.
+bool IsInside(const Node *node, const Node *element) noexcept {
+  while (node && node != element) {
+    node = node->GetParent();
+  }
+  return node != nullptr;
+}
+
+/// Sorts the elements by their places in the document. The walk ends at the last of them, and does not enter an element
+/// of the list that contains no other one.
 std::vector<CoveredElement> InDocumentOrder(std::vector<CoveredElement> &&unordered, const ElementNode *top) {
   std::vector<CoveredElement> ordered;
   ordered.reserve(unordered.size());
-  for (const Node *node = top; node && ordered.size() < unordered.size(); node = NextInTree(node, top)) {
+  bool enters = true;
+  for (const Node *node = top; node && ordered.size() < unordered.size(); node = NextInTree(node, top, enters)) {
     const auto found = std::find_if(unordered.begin(), unordered.end(),
                                     [node](const CoveredElement &one) { return one.element == node; });
+    enters = true;
     if (found != unordered.end()) {
       ordered.push_back(std::move(*found));
       found->element = nullptr;
+      enters = std::any_of(unordered.begin(), unordered.end(),
+                           [node](const CoveredElement &one) { return IsInside(one.element, node); });
     }
   }
   return ordered;

@@ -51,7 +51,7 @@ void NamespaceScope::Declare(const AttributeEvent &declaration) {
   m_declarations.push_back(std::move(declared));
 }
 
-void NamespaceScope::CheckDeclaration(const AttributeEvent &declaration, std::string_view prefix) const {
+void NamespaceScope::CheckDeclaration(const AttributeEvent &declaration, std::string_view prefix) {
   const std::string_view name = declaration.value;
   const auto refuse = [&](Refusal refusal, std::string_view found = {}) {
     m_cursor.Refuse(refusal, declaration.name.data(), found);
@@ -68,8 +68,15 @@ void NamespaceScope::CheckDeclaration(const AttributeEvent &declaration, std::st
   if (name.empty() && !prefix.empty()) {
     refuse(Refusal::PREFIX_UNDECLARED, prefix);
   }
+  if (std::find(m_knownNames.begin(), m_knownNames.end(), name) != m_knownNames.end()) {
+    return;
+  }
   if (!IsUriReference(name)) {
     refuse(Refusal::NOT_A_URI_REFERENCE, name);
+  }
+  if (m_cursor.IsInSource(name)) {
+    m_knownNames[m_nextKnownName] = name;
+    m_nextKnownName = (m_nextKnownName + 1) % m_knownNames.size();
   }
 }
 

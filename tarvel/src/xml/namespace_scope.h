@@ -8,6 +8,7 @@
 
 #include <tarvel/xml/parser.h>
 
+#include <array>
 #include <cstddef>
 #include <cstdint>
 #include <string>
@@ -56,7 +57,7 @@ private:
   };
 
   void Declare(const AttributeEvent &declaration);
-  void CheckDeclaration(const AttributeEvent &declaration, std::string_view prefix) const;
+  void CheckDeclaration(const AttributeEvent &declaration, std::string_view prefix);
   void CheckNames(const std::vector<AttributeEvent> &attributes);
   void CheckFewNames(const std::vector<AttributeEvent> &attributes);
   void CheckManyNames(const std::vector<AttributeEvent> &attributes);
@@ -69,6 +70,10 @@ private:
   const SourceCursor &m_cursor;
   std::vector<Declaration> m_declarations;
   std::vector<std::size_t> m_order; // the attributes of one element sorted by name, if they are many
+  // The last names of namespaces that were found to be URI references. Documents declare a few names again and again. An
+  // empty name is one, too.
+  std::array<std::string_view, 8> m_knownNames{};
+  std::size_t m_nextKnownName = 0;
 };
 
 } // namespace Tarvel::Xml
