@@ -7,6 +7,7 @@
 #include <openssl/pem.h>
 #include <openssl/rsa.h>
 
+#include <algorithm>
 #include <array>
 #include <cstdio>
 #include <stdexcept>
@@ -85,7 +86,7 @@ void RsaLimit::Check() {
 }
 
 void RsaLimit::Hash(std::size_t octets) {
-  m_state->octets.resize(octets);
+  m_state->octets.resize(std::max(m_state->octets.size(), octets)); // grows in the first round only
   std::array<unsigned char, EVP_MAX_MD_SIZE> digest{};
   EVP_DigestInit_ex2(m_state->hash.get(), m_state->sha256.get(), nullptr);
   EVP_DigestUpdate(m_state->hash.get(), m_state->octets.data(), octets);
@@ -93,13 +94,13 @@ void RsaLimit::Hash(std::size_t octets) {
   benchmark::DoNotOptimize(digest);
 }
 
-std::size_t CountSignedOctets(const std::string &message) {
+std::vector<std::size_t> ListSignedLengths(const std::string &message) {
   constexpr const char *REFERENCE = "<ds:Reference URI=\"#";
-  std::size_t octets = 0;
+  std::vector<std::size_t> lengths;
   for (std::size_t at = message.find("<ds:SignedInfo"); at != std::string::npos;
        at = message.find("<ds:SignedInfo", at + 1)) {
     const std::string signedInfo = message.substr(at, LengthOfElement(message, at));
-    octets += signedInfo.size();
+    lengths.push_back(signedInfo.size());
     for (std::size_t reference = signedInfo.find(REFERENCE); reference != std::string::npos;
          reference = signedInfo.find(REFERENCE, reference + 1)) {
       const std::size_t begin = reference + std::string(REFERENCE).size();
@@ -107,14 +108,15 @@ std::size_t CountSignedOctets(const std::string &message) {
       std::size_t attribute = message.find("Id=\"" + identifier + "\"");
       attribute = attribute == std::string::npos ? message.find("ID=\"" + identifier + "\"") : attribute;
       Require(attribute != std::string::npos, "nothing has the identifier " + identifier);
-      octets += LengthOfElement(message, message.rfind('<', attribute));
+      std::size_t length = LengthOfElement(message, message.rfind('<', attribute));
       // A signature inside the element that it covers does not cover itself.
       const std::size_t reset = signedInfo.find("#enveloped-signature", reference);
       const bool isEnveloped = reset < signedInfo.find("</ds:Reference>", reference);
-      octets -= isEnveloped ? LengthOfElement(message, message.rfind("<ds:Signature", at)) : 0;
+      length -= isEnveloped ? LengthOfElement(message, message.rfind("<ds:Signature", at)) : 0;
+      lengths.push_back(length);
     }
   }
-  return octets;
+  return lengths;
 }
 
 } // namespace Bench

@@ -7,6 +7,7 @@
 #include <cstddef>
 #include <memory>
 #include <string>
+#include <vector>
 
 namespace Bench {
 
@@ -31,9 +32,9 @@ private:
   const std::unique_ptr<State> m_state;
 };
 
-/// How many octets a verification of the message must hash: the elements that its signatures refer to, and each `SignedInfo`.
-/// Canonical forms are a little longer, because they have declarations that the message has further outside.
+/// The length of each text that a verification of the message must hash: the elements that its signatures refer to, and each
+/// `SignedInfo`. Canonical forms are a little longer, because they have declarations that the message has further outside.
 /// @throws std::runtime_error when a reference refers to nothing
-std::size_t CountSignedOctets(const std::string &message);
+std::vector<std::size_t> ListSignedLengths(const std::string &message);
 
 } // namespace Bench
