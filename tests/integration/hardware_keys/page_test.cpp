@@ -59,7 +59,7 @@ TEST(PageOfHardwareKeys, HasCommandsThatWork) {
   const SoftwareTpm tpm;
   const WorkFolder &folder = tpm.GetFolder();
   std::string configuration;
-  for (const std::string &line : LinesOfBlocks(ReadPage(), "ini")) {
+  for (const std::string &line : LinesOfBlocks(ReadPage(), "text")) {
     configuration += line + "\n";
   }
   folder.Write("openssl.cnf", configuration);
