@@ -12,6 +12,7 @@
 
 #include <algorithm>
 #include <atomic>
+#include <cstddef>
 #include <exception>
 #include <future>
 #include <map>
@@ -27,6 +28,10 @@ namespace SsoClient {
 namespace {
 
 using namespace Testing;
+
+/// Four threads compute, and two do the input and output. Each look-up of a name has a thread too, which ends soon after
+/// the look-up does. On a busy machine there can be several of them for a moment.
+constexpr std::size_t COMPUTING_AND_IO_THREADS = 6;
 
 const Credential ALICES = PasswordCredential{ALICE, Tarvel::SecretText(PASSWORD)};
 
@@ -118,7 +123,7 @@ TEST_F(CancelledOperations, HaveOneOutcomeEachWhenTheyAreCancelledAtRandomMoment
   EXPECT_GT(texts["The operation was cancelled"], 0);
   EXPECT_EQ(texts[""] + texts["The operation was cancelled"], OPERATIONS);
   EXPECT_TRUE(Eventually([&] { return CountDescriptors() <= descriptors; }));
-  EXPECT_LE(CountThreads(), threads + 8);
+  EXPECT_TRUE(Eventually([&] { return CountThreads() <= threads + COMPUTING_AND_IO_THREADS; })) << CountThreads();
   EXPECT_NE(client->Acquire(ALICES, SpecFor(60)), nullptr);
 }
 
@@ -137,7 +142,7 @@ TEST_F(CancelledOperations, OccupyNoThreadWhileTheyWait) {
     client->AcquireAsync(ALICES, SpecFor(60), call, outcomes.ForNext());
   }
   EXPECT_TRUE(sent->count.WaitFor(OPERATIONS));
-  EXPECT_LE(CountThreads(), threads + 8); // two for the network, four that compute, the look-up of the name
+  EXPECT_TRUE(Eventually([&] { return CountThreads() <= threads + COMPUTING_AND_IO_THREADS; })) << CountThreads();
   cancel.Cancel();
   ASSERT_TRUE(outcomes.WaitFor(OPERATIONS));
   EXPECT_EQ(outcomes.Get(), (std::map<std::string, int>{{"The operation was cancelled", OPERATIONS}}));
