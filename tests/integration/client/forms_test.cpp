@@ -58,7 +58,9 @@ TEST_P(ClientOverTls, AcquiresByCertificateWithEverythingThatASpecCanRequest) {
   fields.delegable = true;
   fields.audience = {"https://a.example/", "https://b.example/"};
   fields.advice = "https://advice.example/{colour=red,green;size=7} urn:more{no value=}";
-  EXPECT_EQ(Compare(Acquire(GetParam(), *Client("client"), CertificateCredential{}, FullSpec()), fields, m_begin), "");
+  EXPECT_EQ(
+      Compare(Acquire(GetParam(), *Client("client"), CertificateCredential{}, SpecWithEverything()), fields, m_begin),
+      "");
 }
 
 TEST_P(ClientOverTls, AcquiresADelegatedTokenByAToken) {

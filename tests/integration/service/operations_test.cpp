@@ -64,11 +64,11 @@ TEST_F(ServiceOverTls, AcquiresABearerTokenByPassword) {
 }
 
 TEST_F(ServiceOverTls, AcquiresABearerTokenByPasswordWithEverythingThatASpecCanRequest) {
-  EXPECT_EQ(Compare(m_plain->AcquireToken(ALICE, PASSWORD, FullSpec()), Full({}), m_begin), "");
+  EXPECT_EQ(Compare(m_plain->AcquireToken(ALICE, PASSWORD, SpecWithEverything()), Full({}), m_begin), "");
 }
 
 TEST_F(ServiceOverTls, AcquiresAHolderOfKeyTokenByPasswordWithEverythingThatASpecCanRequest) {
-  EXPECT_EQ(Compare(m_client->AcquireToken(ALICE, PASSWORD, FullSpec()), Full(Held("client")), m_begin), "");
+  EXPECT_EQ(Compare(m_client->AcquireToken(ALICE, PASSWORD, SpecWithEverything()), Full(Held("client")), m_begin), "");
 }
 
 TEST_F(ServiceOverTls, AcquiresABearerTokenByPasswordEvenWithAnIdentity) {
@@ -86,19 +86,22 @@ TEST_F(ServiceOverTls, AcquiresADelegatedTokenByPassword) {
 TEST_F(ServiceOverTls, AcquiresATokenByCertificate) {
   EXPECT_EQ(Compare(m_client->AcquireTokenByCertificate(SpecFor(3600)), FieldsOfCertificate("client"), m_begin), "");
   const ServiceClient other("other-client");
-  EXPECT_EQ(Compare(other->AcquireTokenByCertificate(FullSpec()), Full(FieldsOfCertificate("other-client")), m_begin),
+  EXPECT_EQ(Compare(other->AcquireTokenByCertificate(SpecWithEverything()), Full(FieldsOfCertificate("other-client")),
+                    m_begin),
             "");
 }
 
 TEST_F(ServiceOverTls, AcquiresADelegatedTokenByCertificate) {
   ExpectedFields expected = Full(FieldsOfCertificate("client"));
   expected.delegation = {"bob@corp.example"};
-  EXPECT_EQ(Compare(m_client->AcquireTokenByCertificate(To("bob@corp.example", FullSpec())), expected, m_begin), "");
+  EXPECT_EQ(
+      Compare(m_client->AcquireTokenByCertificate(To("bob@corp.example", SpecWithEverything())), expected, m_begin),
+      "");
 }
 
 TEST_F(ServiceOverTls, ExchangesATokenWithoutDelegation) {
   const TokenPtr held = m_client->AcquireToken(ALICE, PASSWORD, Delegable(SpecFor(3600)));
-  const TokenPtr exchanged = m_client->AcquireTokenByToken(*held, FullSpec());
+  const TokenPtr exchanged = m_client->AcquireTokenByToken(*held, SpecWithEverything());
   EXPECT_EQ(Compare(exchanged, Full(Held("client")), m_begin), "");
   EXPECT_NE(exchanged->GetId(), held->GetId());
 }
@@ -110,12 +113,12 @@ TEST_F(ServiceOverTls, ExchangesATokenForABearerToken) {
 
 TEST_F(ServiceOverTls, ExchangesATokenWithDelegationRepeatedly) {
   const TokenPtr held = m_client->AcquireToken(ALICE, PASSWORD, Delegable(SpecFor(3600)));
-  const TokenPtr first = m_client->AcquireTokenByToken(*held, To("bob@corp.example", FullSpec()));
+  const TokenPtr first = m_client->AcquireTokenByToken(*held, To("bob@corp.example", SpecWithEverything()));
   ExpectedFields expected = Full(Held("client"));
   expected.delegation = {"bob@corp.example"};
   EXPECT_EQ(Compare(first, expected, m_begin), "");
   const std::int64_t later = NowInMilliseconds();
-  const TokenPtr second = m_client->AcquireTokenByToken(*first, To("carol@corp.example", FullSpec()));
+  const TokenPtr second = m_client->AcquireTokenByToken(*first, To("carol@corp.example", SpecWithEverything()));
   expected.delegation = {"bob@corp.example", "carol@corp.example"};
   EXPECT_EQ(Compare(second, expected, later), "");
   std::vector<Delegate> before, after;
@@ -125,7 +128,7 @@ TEST_F(ServiceOverTls, ExchangesATokenWithDelegationRepeatedly) {
 }
 
 TEST_F(ServiceOverTls, RenewsAToken) {
-  const TokenPtr held = m_client->AcquireToken(ALICE, PASSWORD, FullSpec());
+  const TokenPtr held = m_client->AcquireToken(ALICE, PASSWORD, SpecWithEverything());
   const TokenPtr renewed = m_client->RenewToken(*held, 1800);
   ExpectedFields expected = Full(Held("client"));
   expected.lifetimeSec = 1800;
@@ -137,7 +140,7 @@ TEST_F(ServiceOverTls, RenewsAToken) {
 
 TEST_F(ServiceOverTls, ValidatesATokenOfEitherKind) {
   EXPECT_TRUE(m_plain->ValidateSubject(*m_plain->AcquireToken(ALICE, PASSWORD, SpecFor(60))));
-  EXPECT_TRUE(m_plain->ValidateSubject(*m_client->AcquireToken(ALICE, PASSWORD, FullSpec())));
+  EXPECT_TRUE(m_plain->ValidateSubject(*m_client->AcquireToken(ALICE, PASSWORD, SpecWithEverything())));
   EXPECT_TRUE(m_client->ValidateSubject(*m_client->AcquireTokenByCertificate(SpecFor(60))));
 }
 
@@ -169,7 +172,7 @@ TEST_F(ServiceOverTls, ReportsThatAHolderOfKeyTokenWasRequestedWithoutProof) {
 }
 
 TEST_F(ServiceOverTls, ReportsARenewalByAnotherKey) {
-  const TokenPtr held = m_client->AcquireToken(ALICE, PASSWORD, FullSpec());
+  const TokenPtr held = m_client->AcquireToken(ALICE, PASSWORD, SpecWithEverything());
   EXPECT_THROWS_MESSAGE(ServiceClient("other-client")->RenewToken(*held, 60), InvalidCredentialsException,
                         "Authentication failed: the renewal is not signed by the holder of the token's key");
 }
@@ -202,7 +205,7 @@ TEST_F(ServiceOverTls, ReportsTheDelegationOfATokenThatIsNotDelegable) {
 }
 
 TEST_F(ServiceOverTls, ReportsThatATamperedTokenIsNotExchangedOrRenewed) {
-  const TokenPtr held = m_client->AcquireToken(ALICE, PASSWORD, FullSpec());
+  const TokenPtr held = m_client->AcquireToken(ALICE, PASSWORD, SpecWithEverything());
   const char message[] = "Authentication failed: the token is not signed by this service";
   EXPECT_THROWS_MESSAGE(m_client->AcquireTokenByToken(Tampered(*held), SpecFor(60)), InvalidCredentialsException,
                         message);

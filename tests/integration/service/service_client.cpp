@@ -100,7 +100,7 @@ ServiceClient::ServiceClient(const std::string &identity, const std::string &url
     : m_context(TrustingContext()),
       m_service(SsoClient::CreateSecurityTokenService(ConfigFor(*m_context, identity, url))) {}
 
-SsoClient::TokenSpec FullSpec() {
+SsoClient::TokenSpec SpecWithEverything() {
   SsoClient::TokenSpec spec = SpecFor(7200);
   spec.audienceRestriction = {"https://b.example/", "https://a.example/"};
   spec.advice = {{"https://advice.example/", {{"colour", {"red", "green"}}, {"size", {"7"}}}},

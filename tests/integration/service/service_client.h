@@ -52,7 +52,7 @@ private:
 };
 
 /// Everything that a spec can request, except a delegate.
-SsoClient::TokenSpec FullSpec();
+SsoClient::TokenSpec SpecWithEverything();
 
 /// The fields of a token that `DescribeFields` shows; the defaults are those of alice's plain bearer token.
 struct ExpectedFields {
