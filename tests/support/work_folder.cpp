@@ -8,6 +8,7 @@
 #include <fstream>
 #include <iterator>
 #include <stdexcept>
+#include <system_error>
 
 #include <stdlib.h>
 
@@ -20,7 +21,11 @@ WorkFolder::WorkFolder() : m_path(testing::TempDir() + "ssoclient_XXXXXX") {
 }
 
 WorkFolder::~WorkFolder() {
-  std::filesystem::remove_all(m_path);
+  std::error_code error;
+  std::filesystem::remove_all(m_path, error);
+  if (error) { // for example, because something still writes into the folder after the end of the test
+    ADD_FAILURE() << "cannot remove " << m_path << ": " << error.message();
+  }
 }
 
 std::string WorkFolder::Write(const std::string &name, const std::string &content) const {
