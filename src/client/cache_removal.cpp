@@ -22,7 +22,8 @@ void Log(const char *reason) noexcept {
   }
 }
 
-/// Tries again until it has the lock, at most for the time of one attempt: another program may have the lock as long.
+/// Tries again until it has the lock, or until the file does not have the token, at most for the time of one attempt:
+/// another program may have the lock as long.
 class Removal : public std::enable_shared_from_this<Removal> {
 public:
   Removal(std::shared_ptr<const RefreshSupplies> supplies, std::string tokenId)
@@ -40,8 +41,12 @@ public:
 private:
   void Run() noexcept {
     try {
-      if (const std::unique_ptr<TokenCacheFile::Lock> lock = m_supplies->cache->TryLock()) {
-        m_supplies->cache->Remove(*lock, m_tokenId);
+      const TokenCacheFile &cache = *m_supplies->cache;
+      if (!cache.Contains(m_tokenId)) {
+        return;
+      }
+      if (const std::unique_ptr<TokenCacheFile::Lock> lock = cache.TryLockExisting()) {
+        cache.Remove(*lock, m_tokenId);
         return;
       }
       const auto now = m_supplies->time.GetSteadyTime();

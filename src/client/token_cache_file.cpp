@@ -13,6 +13,15 @@
 
 namespace SsoClient {
 
+namespace {
+
+bool HasToken(const std::string &text, const CacheBinding &binding, const std::string &tokenId) {
+  const boost::optional<CachedToken> cached = FindCachedToken(text, binding);
+  return cached && cached->id == CacheValue(tokenId);
+}
+
+} // namespace
+
 TokenCacheFile::TokenCacheFile(std::string path, CacheBinding binding, Verify verify)
     : m_path(path), m_file(std::move(path)), m_binding(std::move(binding)), m_verify(std::move(verify)) {}
 
@@ -41,10 +50,13 @@ void TokenCacheFile::Write(Lock &lock, const SamlToken &token) const {
   lock.Replace(WriteCacheText(m_binding, token));
 }
 
+bool TokenCacheFile::Contains(const std::string &tokenId) const {
+  const boost::optional<std::string> text = m_file.Read();
+  return text && HasToken(*text, m_binding, tokenId);
+}
+
 void TokenCacheFile::Remove(Lock &lock, const std::string &tokenId) const {
-  const std::string text = lock.Read();
-  const boost::optional<CachedToken> cached = FindCachedToken(text, m_binding);
-  if (cached && cached->id == CacheValue(tokenId)) {
+  if (HasToken(lock.Read(), m_binding, tokenId)) {
     lock.Clear();
   }
 }

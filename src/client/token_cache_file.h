@@ -40,6 +40,10 @@ public:
   /// @throws Tarvel::IOException when the file is refused or cannot be made
   std::unique_ptr<Lock> TryLock() const { return m_file.TryLock(); }
 
+  /// The same, but makes no file: also null when there is no file.
+  /// @throws Tarvel::IOException when the file is refused
+  std::unique_ptr<Lock> TryLockExisting() const { return m_file.TryLockExisting(); }
+
   /// The token of this binding, verified again. Null when there is no file, or when the file is empty or truncated, has
   /// another version or another binding, or has a token that is refused now. Needs no lock.
   /// @throws Tarvel::IOException when the file is refused (a link, another owner, a mode that lets other users read or
@@ -51,6 +55,10 @@ public:
   /// @throws Tarvel::IOException when it cannot be written, for example on a full disk; the old content then stays, and
   ///         no other file remains.
   void Write(Lock &lock, const SamlToken &token) const;
+
+  /// Whether the file has the token with this identifier and this binding. Needs no lock.
+  /// @throws Tarvel::IOException when the file is refused or cannot be read
+  bool Contains(const std::string &tokenId) const;
 
   /// Removes the token from the file, if it is the one with this identifier and has this binding.
   /// @throws Tarvel::IOException when the file cannot be read or written

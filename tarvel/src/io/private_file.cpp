@@ -151,14 +151,20 @@ OwnedDescriptor Create(const std::string &path) {
   return file;
 }
 
+/// The result is not open if there is no file.
+OwnedDescriptor OpenExisting(const std::string &path) {
+  OwnedDescriptor file = Open(path, O_RDWR);
+  if (!file.IsOpen() && errno != ENOENT) {
+    RefuseToOpen(errno, path);
+  }
+  return file;
+}
+
 OwnedDescriptor OpenOrCreate(const std::string &path) {
   for (int attempt = 0; attempt < MAX_ATTEMPTS; ++attempt) {
-    OwnedDescriptor file = Open(path, O_RDWR);
+    OwnedDescriptor file = OpenExisting(path);
     if (file.IsOpen()) {
       return file;
-    }
-    if (errno != ENOENT) {
-      RefuseToOpen(errno, path);
     }
     OwnedDescriptor created = Create(path);
     if (created.IsOpen()) {
@@ -183,6 +189,27 @@ bool HasPath(int descriptor, const std::string &path) {
   const struct stat opened = StatusOf(descriptor, path);
   struct stat current = {};
   return ::lstat(path.c_str(), &current) == 0 && current.st_dev == opened.st_dev && current.st_ino == opened.st_ino;
+}
+
+/// The lock of the file that `open` opens; null if another holder has the lock, or if there is no file to open.
+std::unique_ptr<PrivateFileLock> TryToLockFile(const std::string &path, OwnedDescriptor (*open)(const std::string &)) {
+  for (int attempt = 0; attempt < MAX_ATTEMPTS; ++attempt) {
+    OwnedDescriptor file = open(path);
+    if (!file.IsOpen()) {
+      return nullptr;
+    }
+    RequirePrivate(StatusOf(file.Get(), path), path);
+    if (!TryToLock(file.Get(), path)) {
+      return nullptr;
+    }
+    // The file may have been replaced before it was locked.
+    if (HasPath(file.Get(), path)) {
+      auto lock = std::make_unique<PrivateFileLock>(path, file.Get());
+      file.Release();
+      return lock;
+    }
+  }
+  return nullptr;
 }
 
 /// The file with the new content, until it has the final path. Only the holder of the lock makes one, so an existing
@@ -332,20 +359,11 @@ boost::optional<std::string> PrivateFile::Read() const {
 }
 
 std::unique_ptr<PrivateFileLock> PrivateFile::TryLock() const {
-  for (int attempt = 0; attempt < MAX_ATTEMPTS; ++attempt) {
-    OwnedDescriptor file = OpenOrCreate(m_path);
-    RequirePrivate(StatusOf(file.Get(), m_path), m_path);
-    if (!TryToLock(file.Get(), m_path)) {
-      return nullptr;
-    }
-    // The file may have been replaced before it was locked.
-    if (HasPath(file.Get(), m_path)) {
-      auto lock = std::make_unique<PrivateFileLock>(m_path, file.Get());
-      file.Release();
-      return lock;
-    }
-  }
-  return nullptr;
+  return TryToLockFile(m_path, OpenOrCreate);
+}
+
+std::unique_ptr<PrivateFileLock> PrivateFile::TryLockExisting() const {
+  return TryToLockFile(m_path, OpenExisting);
 }
 
 } // namespace Tarvel

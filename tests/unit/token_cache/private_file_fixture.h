@@ -36,11 +36,12 @@ class PrivateFileFixture : public ::testing::Test {
 protected:
   ~PrivateFileFixture() override { EXPECT_EQ(CountDescriptors(), m_descriptors); }
 
-  /// Expects that both ways to open the file are refused.
+  /// Expects that each way to open the file is refused.
   void ExpectRefusal(const std::string &reason) const {
     const std::string message = "Cannot use " + m_path + ": " + reason;
     EXPECT_THROWS_MESSAGE(m_file.Read(), Tarvel::IOException, message);
     EXPECT_THROWS_MESSAGE(m_file.TryLock(), Tarvel::IOException, message);
+    EXPECT_THROWS_MESSAGE(m_file.TryLockExisting(), Tarvel::IOException, message);
   }
 
   void WritePrivately(const std::string &content) const { m_file.TryLock()->Replace(content); }

@@ -34,6 +34,20 @@ TEST_F(PrivateFileTest, HasNoContentIfItDoesNotExistAndIsNotMadeByARead) {
   EXPECT_EQ(m_folder.Names(), Names{});
 }
 
+TEST_F(PrivateFileTest, IsNotMadeToLockAnExistingFile) {
+  EXPECT_EQ(m_file.TryLockExisting(), nullptr);
+  EXPECT_EQ(m_folder.Names(), Names{});
+  WritePrivately("content");
+  {
+    const auto lock = m_file.TryLockExisting();
+    ASSERT_NE(lock, nullptr);
+    EXPECT_EQ(lock->Read(), "content");
+    EXPECT_EQ(m_file.TryLock(), nullptr);
+    EXPECT_EQ(m_file.TryLockExisting(), nullptr);
+  }
+  EXPECT_NE(m_file.TryLock(), nullptr);
+}
+
 TEST_F(PrivateFileTest, MakesAnEmptyFileForItsOwnerOnlyWithAnyMask) {
   for (const mode_t mask : {0U, 0022U, 0777U}) {
     ::unlink(m_path.c_str());

@@ -281,6 +281,20 @@ TEST_F(TokenCacheFileTest, RemovesOnlyTheTokenWithTheIdentifier) {
   EXPECT_NE(file.Read(), nullptr);
 }
 
+TEST_F(TokenCacheFileTest, ContainsOnlyTheTokenWithTheIdentifierAndTheBinding) {
+  const TokenCacheFile file = FileFor(Binding());
+  const auto token = Token();
+  EXPECT_FALSE(file.Contains(token->GetId()));
+  EXPECT_EQ(m_folder.Names(), std::set<std::string>{});
+  Write(file, *token);
+  EXPECT_TRUE(file.Contains(token->GetId()));
+  EXPECT_FALSE(file.Contains(token->GetId() + "x"));
+  EXPECT_FALSE(file.Contains(""));
+  EXPECT_FALSE(FileFor(RichBinding()).Contains(token->GetId()));
+  file.TryLockExisting()->Clear();
+  EXPECT_FALSE(file.Contains(token->GetId()));
+}
+
 TEST_F(TokenCacheFileTest, DoesNotChangeAFileThatIsRefused) {
   const TokenCacheFile file = FileFor(Binding());
   Write(file, *Token());
@@ -289,6 +303,8 @@ TEST_F(TokenCacheFileTest, DoesNotChangeAFileThatIsRefused) {
   const std::string message = "Cannot use " + m_path + ": its mode lets other users read or write it; it must be 0600";
   EXPECT_THROWS_MESSAGE(file.Read(), Tarvel::IOException, message);
   EXPECT_THROWS_MESSAGE(file.TryLock(), Tarvel::IOException, message);
+  EXPECT_THROWS_MESSAGE(file.TryLockExisting(), Tarvel::IOException, message);
+  EXPECT_THROWS_MESSAGE(file.Contains("any"), Tarvel::IOException, message);
   EXPECT_EQ(Text(), text);
 }
 

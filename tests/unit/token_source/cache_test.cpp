@@ -231,6 +231,28 @@ TEST_F(CachedSource, RemovesAnInvalidatedTokenAfterAnotherProgramHasUnlockedTheF
   EXPECT_EQ(m_folder.Read("token"), "");
 }
 
+TEST_F(CachedSource, MakesNoFileToRemoveAnInvalidatedToken) {
+  m_first.Source().Invalidate("first");
+  EXPECT_EQ(m_folder.Names(), std::set<std::string>{});
+
+  m_first.Provide(Token("first", 1000s));
+  AdvanceBoth(800s);
+  EXPECT_EQ(m_second.Ask(), "waits"); // it has locked the file
+  m_first.Source().Invalidate("first");
+  ASSERT_EQ(::unlink(m_path.c_str()), 0);
+  AdvanceBoth(20ms);
+  EXPECT_EQ(m_folder.Names(), std::set<std::string>{});
+}
+
+TEST_F(CachedSource, DoesNotWaitForTheLockOfAFileThatDoesNotHaveTheInvalidatedToken) {
+  m_first.Provide(Token("first", 1000s));
+  AdvanceBoth(800s);
+  EXPECT_EQ(m_second.Ask(), "waits"); // it has locked the file
+  const std::size_t timers = m_first.time.CountTimers();
+  m_first.Source().Invalidate("another");
+  EXPECT_EQ(m_first.time.CountTimers(), timers);
+}
+
 TEST_F(CachedSource, EndsTheCallWhenTheFileIsRefusedAndWorksAfterwards) {
   m_folder.Write("token", "");
   ASSERT_EQ(::chmod(m_path.c_str(), 0644), 0);

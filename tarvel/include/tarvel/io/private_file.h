@@ -75,6 +75,10 @@ public:
   /// @throws IOException when the file is refused, or cannot be made or locked; std::bad_alloc
   std::unique_ptr<PrivateFileLock> TryLock() const;
 
+  /// Like `TryLock`, but makes no file: also null when there is no file.
+  /// @throws IOException when the file is refused or cannot be locked; std::bad_alloc
+  std::unique_ptr<PrivateFileLock> TryLockExisting() const;
+
 private:
   std::string m_path;
 };
