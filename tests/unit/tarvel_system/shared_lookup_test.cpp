@@ -17,6 +17,7 @@
 #include <set>
 #include <string>
 #include <thread>
+#include <utility>
 #include <vector>
 
 namespace Tarvel::System {
@@ -27,6 +28,49 @@ using Testing::Eventually;
 using Testing::PATIENCE;
 using Testing::UnusedPort;
 
+using Names = std::vector<std::string>;
+
+/// A started connect to a port that refuses connections.
+class Asking {
+public:
+  explicit Asking(const std::string &host) {
+    static const UnusedPort *const port = new UnusedPort;
+    m_endpoint = host + ":" + std::to_string(port->GetPort());
+    m_socket->AsyncConnect(host, port->GetPort(), m_completion.ForEnd());
+    const std::lock_guard<std::mutex> lock(s_mutex);
+    s_asked.insert(host);
+  }
+
+  /// Returns the names that were asked for since the last call.
+  static std::set<std::string> TakeAskedNames() {
+    const std::lock_guard<std::mutex> lock(s_mutex);
+    return std::exchange(s_asked, {});
+  }
+
+  void Close() { m_socket->Close(); }
+
+  int CountCalls() const { return m_completion.GetCalls(); }
+
+  /// How the connect ended: "looked up" after a look-up without failure, else the reason.
+  std::string GetOutcome() const {
+    const std::string message = m_completion.GetMessage();
+    const std::string start = "Cannot connect to " + m_endpoint + ": ";
+    if (message.rfind(start, 0) != 0) {
+      return message;
+    }
+    const std::string reason = message.substr(start.size());
+    return reason == "Connection refused" ? "looked up" : reason;
+  }
+
+private:
+  inline static std::mutex s_mutex;
+  inline static std::set<std::string> s_asked; // guarded by s_mutex
+
+  std::string m_endpoint;
+  Completion m_completion;
+  const Ref<TcpClientSocket> m_socket = CreateTcpClientSocket();
+};
+
 /// Replaces the resolver. `Hold` makes the look-ups of a name wait until it is released. Each look-up returns the
 /// address 127.0.0.1, or fails with the message that `FailWith` has set.
 class ResolverStandIn {
@@ -36,9 +80,14 @@ public:
         m_scope([state = m_state](const std::string &host) { return state->LookUp(host); }) {}
   ResolverStandIn(const ResolverStandIn &) = delete;
   ResolverStandIn &operator=(const ResolverStandIn &) = delete;
-  /// Ends all look-ups: the next test must not join one of this test.
+  /// Ends all look-ups: the next test must not join one of this test. A look-up calls back after it is no longer
+  /// registered, so one more answer for each name shows that those before have ended.
   ~ResolverStandIn() {
     ReleaseAll();
+    for (const std::string &name : Asking::TakeAskedNames()) {
+      EXPECT_NE(Asking(name).GetOutcome(), "(never called)");
+    }
+    Asking::TakeAskedNames();
     EXPECT_TRUE(Eventually([this] { return CountRunning() == 0; }));
   }
 
@@ -113,39 +162,7 @@ private:
   const ScopedNameLookup m_scope;
 };
 
-/// A started connect to a port that refuses connections.
-class Asking {
-public:
-  explicit Asking(const std::string &host) {
-    static const UnusedPort *const port = new UnusedPort;
-    m_endpoint = host + ":" + std::to_string(port->GetPort());
-    m_socket->AsyncConnect(host, port->GetPort(), m_completion.ForEnd());
-  }
-
-  void Close() { m_socket->Close(); }
-
-  int CountCalls() const { return m_completion.GetCalls(); }
-
-  /// How the connect ended: "looked up" after a look-up without failure, else the reason.
-  std::string GetOutcome() const {
-    const std::string message = m_completion.GetMessage();
-    const std::string start = "Cannot connect to " + m_endpoint + ": ";
-    if (message.rfind(start, 0) != 0) {
-      return message;
-    }
-    const std::string reason = message.substr(start.size());
-    return reason == "Connection refused" ? "looked up" : reason;
-  }
-
-private:
-  std::string m_endpoint;
-  Completion m_completion;
-  const Ref<TcpClientSocket> m_socket = CreateTcpClientSocket();
-};
-
-using Names = std::vector<std::string>;
-
-/// Holds names that no other test uses, and starts a connect to each.
+/// Holds names that their test does not use otherwise, and starts a connect to each.
 std::vector<Asking> AskForDeadNames(ResolverStandIn &resolver, std::size_t count) {
   std::vector<Asking> dead;
   for (std::size_t i = 0; i < count; ++i) {
