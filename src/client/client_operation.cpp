@@ -82,7 +82,8 @@ OperationEnding ClientOperation::RunToEnd() {
     if (IsOfParent()) {
       throw CommunicationException("The operation was under way when the process forked: its parent goes on with it");
     }
-    if (m_isDecided && !std::exchange(m_waiter->isEnding, true)) {
+    const bool mayFinish = m_isDecided && (!m_isDecidedByStep || m_runningSteps == 0);
+    if (mayFinish && !std::exchange(m_waiter->isEnding, true)) {
       lock.unlock();
       Finish(false);
       lock.lock();
@@ -225,15 +226,10 @@ void ClientOperation::RunStep(Step step, bool isOnComputePool) noexcept {
   } catch (...) {
     ending = OperationEnding{std::current_exception(), nullptr, false};
   }
-  EndStep();
-  if (!ending || !Decide(std::move(*ending))) {
-    return;
+  if (ending) {
+    Decide(std::move(*ending), true);
   }
-  if (isOnComputePool && !m_waiter) {
-    Finish(true);
-  } else {
-    FinishElsewhere();
-  }
+  EndStep(isOnComputePool);
 }
 
 /// @return false when the end has been decided.
@@ -246,11 +242,25 @@ bool ClientOperation::BeginStep() noexcept {
   return true;
 }
 
-void ClientOperation::EndStep() noexcept {
-  Secrets released; // destroyed outside the lock
-  const std::lock_guard<ForkSafeMutex> lock(m_mutex);
-  if (--m_runningSteps == 0 && m_isDecided) {
-    std::swap(released, m_secrets);
+/// Finishes the operation if a step has decided its end and this was the last to run: a thread that sends can still be in
+/// its step when another has read the answer. So the handler is destroyed before a caller gets the result.
+void ClientOperation::EndStep(bool isOnComputePool) noexcept {
+  bool finishes = false;
+  {
+    Secrets released; // destroyed outside the lock
+    const std::lock_guard<ForkSafeMutex> lock(m_mutex);
+    if (--m_runningSteps == 0 && m_isDecided) {
+      std::swap(released, m_secrets);
+      finishes = m_isDecidedByStep;
+    }
+  }
+  if (!finishes) {
+    return;
+  }
+  if (isOnComputePool && !m_waiter) {
+    Finish(true);
+  } else {
+    FinishElsewhere();
   }
 }
 
@@ -260,14 +270,14 @@ bool ClientOperation::IsDecided() const noexcept {
 }
 
 void ClientOperation::Cancel(std::exception_ptr failure) noexcept {
-  if (Decide({std::move(failure), nullptr, false})) {
+  if (Decide({std::move(failure), nullptr, false}, false)) {
     FinishElsewhere();
   }
 }
 
 /// Decides how the operation ends. @return false when its end was decided before, and in a child of the process that
 ///         started it.
-bool ClientOperation::Decide(OperationEnding ending) noexcept {
+bool ClientOperation::Decide(OperationEnding ending, bool isByStep) noexcept {
   Held held;
   Secrets released;
   {
@@ -276,6 +286,7 @@ bool ClientOperation::Decide(OperationEnding ending) noexcept {
       return false;
     }
     m_isDecided = true;
+    m_isDecidedByStep = isByStep;
     m_ending = std::move(ending);
     std::swap(held, m_held);
     if (m_runningSteps == 0) {
@@ -352,7 +363,7 @@ void ClientOperation::Complete() noexcept {
 
 /// Ends an operation that has not started. @return false when its end was decided before.
 bool ClientOperation::Abandon(std::exception_ptr failure) noexcept {
-  if (!Decide({std::move(failure), nullptr, false})) {
+  if (!Decide({std::move(failure), nullptr, false}, false)) {
     return false;
   }
   m_completion = nullptr;

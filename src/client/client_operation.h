@@ -138,13 +138,13 @@ private:
   void Schedule(Step step, Place where);
   void RunStep(Step step, bool isOnComputePool) noexcept;
   bool BeginStep() noexcept;
-  void EndStep() noexcept;
+  void EndStep(bool isOnComputePool) noexcept;
   bool IsDecided() const noexcept;
   bool WaitForChange(std::unique_lock<Tarvel::ForkSafeMutex> &lock);
   void OnWaitLimit() noexcept;
 
   // How it ends.
-  bool Decide(OperationEnding ending) noexcept;
+  bool Decide(OperationEnding ending, bool isByStep) noexcept;
   void FinishElsewhere() noexcept;
   void Finish(bool isOnComputePool) noexcept;
   void OnEventsEnded() noexcept override;
@@ -177,6 +177,7 @@ private:
 
   mutable Tarvel::ForkSafeMutex m_mutex; // guards what follows
   bool m_isDecided = false;
+  bool m_isDecidedByStep = false; // then it finishes when no step runs, otherwise at once
   int m_runningSteps = 0;
   unsigned m_exchange = 0;                                   // the number of the last request
   bool m_isLate = false;                                     // its time-out has passed

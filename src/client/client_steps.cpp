@@ -231,7 +231,7 @@ void ClientOperation::OnResponse(const Tarvel::Exception *failure, Tarvel::Reade
   } catch (...) {
     unscheduled = std::current_exception();
   }
-  EndStep();
+  EndStep(false);
   if (unscheduled) {
     Cancel(unscheduled);
   }

@@ -2,6 +2,7 @@
 // The forms of each operation, over the real transport and over a scripted one.
 #include "client_setup.h"
 #include "support/recorded_log.h"
+#include "support/rendezvous.h"
 #include "support/scripted_server.h"
 #include "support/soap_responses.h"
 
@@ -214,6 +215,44 @@ TEST(TokenClient, NegotiatesManyLegsInOneSession) {
   EXPECT_EQ(transport->Sent(),
             (Strings{"1: InitialSPNego 60 c1", "1: ContinuedSPNego ctx c2", "1: ContinuedSPNego ctx c3"}));
   EXPECT_EQ(handler->received, (Strings{"", "s1", "s2", "final"}));
+}
+
+/// A transport whose thread is still sending when another has read the answer, and the handlers of its negotiations.
+class SlowSending : public testing::Test {
+protected:
+  NegotiationCredential GetCredential() {
+    return {[this] {
+      auto handler = std::make_shared<Testing::NegotiationHandlerStandIn>(std::vector{Testing::Leg("one")});
+      made = handler;
+      return handler;
+    }};
+  }
+
+  const std::shared_ptr<Testing::EventCount> read = std::make_shared<Testing::EventCount>();
+  const std::shared_ptr<ScriptedTransport> transport = std::make_shared<ScriptedTransport>(
+      [](const Request &, int) { return boost::make_optional(Testing::Success("leg:ctx||" + Testing::BearerXml())); },
+      [read = read] {
+        EXPECT_TRUE(read->WaitFor(1));
+        std::this_thread::sleep_for(std::chrono::milliseconds(100)); // long enough to end the operation too early
+      });
+  const std::shared_ptr<TokenClient> client = ClientOn(transport, [this] {
+    Testing::ClientParts parts;
+    parts.onRead = [read = read] { read->Add(); };
+    return parts;
+  }());
+  std::weak_ptr<NegotiationHandler> made;
+};
+
+TEST_F(SlowSending, EndsAndItsHandlerIsDestroyedBeforeTheCallReturns) {
+  EXPECT_EQ(client->Acquire(GetCredential(), SpecFor(60))->GetSubject().ToString(), SUBJECT);
+  EXPECT_TRUE(made.expired());
+}
+
+TEST_F(SlowSending, EndsAndItsHandlerIsDestroyedBeforeTheCallback) {
+  std::promise<bool> isDestroyed;
+  client->AcquireAsync(GetCredential(), SpecFor(60), {},
+                       [&](const TokenOutcome &) { isDestroyed.set_value(made.expired()); });
+  EXPECT_TRUE(isDestroyed.get_future().get());
 }
 
 TEST(TokenClient, RefusesNullArguments) {

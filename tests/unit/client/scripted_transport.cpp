@@ -36,8 +36,10 @@ Reply Unavailable(const std::string &retryAfter) {
 }
 
 struct ScriptedTransport::State {
-  explicit State(Script scriptOfTest) : script(std::move(scriptOfTest)) {}
+  State(Script scriptOfTest, std::function<void()> ofTest)
+      : script(std::move(scriptOfTest)), afterSending(std::move(ofTest)) {}
   const Script script;
+  const std::function<void()> afterSending;
   std::atomic<int> sessions{0};
   std::atomic<int> open{0};
   std::atomic<int> cancelled{0};
@@ -134,6 +136,7 @@ public:
       m_state->held.push_back(pending);
     }
     m_state->sentCount.Add();
+    m_state->afterSending();
   }
 
   void TimeOut(ScheduledItem &item) noexcept override { dynamic_cast<Pending &>(item).TimeOut(); }
@@ -143,7 +146,8 @@ private:
   const int m_number;
 };
 
-ScriptedTransport::ScriptedTransport(Script script) : m_state(std::make_shared<State>(std::move(script))) {}
+ScriptedTransport::ScriptedTransport(Script script, std::function<void()> afterSending)
+    : m_state(std::make_shared<State>(std::move(script), std::move(afterSending))) {}
 
 ScriptedTransport::~ScriptedTransport() {
   std::vector<Ref<Pending>> held; // destroyed after the lock: each of them shares the state

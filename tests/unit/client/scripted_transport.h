@@ -39,7 +39,9 @@ public:
   /// May throw.
   using Script = std::function<boost::optional<Reply>(const SsoClient::Request &request, int number)>;
 
-  explicit ScriptedTransport(Script script);
+  /// @param afterSending called on the thread that sends, before it returns to the client
+  explicit ScriptedTransport(
+      Script script, std::function<void()> afterSending = [] {});
   ScriptedTransport(const ScriptedTransport &) = delete;
   ScriptedTransport &operator=(const ScriptedTransport &) = delete;
   ~ScriptedTransport();
