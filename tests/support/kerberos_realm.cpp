@@ -2,6 +2,8 @@
 
 #include "support/kerberos_realm.h"
 
+#include "support/loopback_socket.h"
+
 #include <algorithm>
 #include <array>
 #include <csignal>
@@ -10,7 +12,6 @@
 #include <stdexcept>
 #include <system_error>
 
-#include <arpa/inet.h>
 #include <fcntl.h>
 #include <sys/prctl.h>
 #include <sys/socket.h>
@@ -20,7 +21,7 @@
 namespace Testing {
 namespace {
 
-/// How many ports are tried, because another process may take one first.
+/// How many ports are tried, because another process may use the port over UDP.
 constexpr int PORT_TRIALS = 5;
 
 /// The clock skew that Kerberos tolerates by default, and the one that a client needs to get a ticket from a centre
@@ -28,20 +29,16 @@ constexpr int PORT_TRIALS = 5;
 constexpr int USUAL_CLOCK_SKEW_SEC = 300;
 constexpr int ANY_CLOCK_SKEW_SEC = 1000000;
 
-/// A port of 127.0.0.1 that is not in use now.
-int FindFreePort() {
-  const int descriptor = socket(AF_INET, SOCK_STREAM | SOCK_CLOEXEC, 0);
-  sockaddr_in address{};
-  address.sin_family = AF_INET;
-  address.sin_addr.s_addr = htonl(INADDR_LOOPBACK);
-  socklen_t length = sizeof address;
-  auto *const generic = reinterpret_cast<sockaddr *>(&address);
-  const bool isBound = bind(descriptor, generic, length) == 0 && getsockname(descriptor, generic, &length) == 0;
-  close(descriptor);
-  if (!isBound) {
-    throw std::runtime_error("no free port");
+/// A socket that is bound to a port of 127.0.0.1 of its own, which it sets `port` to. Only programs that ask for this port
+/// and share it, like a centre, can use it as long as the socket is open.
+int ReservePort(int &port) {
+  const int descriptor = BindLoopback(false, port);
+  const int on = 1;
+  if (setsockopt(descriptor, SOL_SOCKET, SO_REUSEADDR, &on, sizeof on) != 0) {
+    close(descriptor);
+    throw std::system_error(errno, std::generic_category(), "SO_REUSEADDR");
   }
-  return ntohs(address.sin_port);
+  return descriptor;
 }
 
 /// Also searches the folders of daemons, which are not in every user's search path.
@@ -221,7 +218,8 @@ std::vector<std::string> KerberosRealm::MakeEnvironment(const std::string &confi
 
 void KerberosRealm::StartCentreOnSomePort() {
   for (int trial = 1; m_centre < 0; ++trial) {
-    m_port = FindFreePort();
+    ClosePort();
+    m_reservedPort = ReservePort(m_port);
     WriteConfiguration("krb5.conf", USUAL_CLOCK_SKEW_SEC);
     WriteConfiguration("any_clock.conf", ANY_CLOCK_SKEW_SEC);
     WriteCentreProfile();
@@ -247,8 +245,16 @@ std::string KerberosRealm::StartCentre() {
   return output;
 }
 
+void KerberosRealm::ClosePort() noexcept {
+  if (m_reservedPort >= 0) {
+    close(m_reservedPort);
+    m_reservedPort = -1;
+  }
+}
+
 void KerberosRealm::Clean() noexcept {
   Stop();
+  ClosePort();
   std::error_code ignored;
   std::filesystem::remove_all(m_folder, ignored);
 }

@@ -62,11 +62,13 @@ private:
   std::vector<std::string> MakeEnvironment(const std::string &configuration) const;
   void StartCentreOnSomePort();
   std::string StartCentre(); // returns its output
+  void ClosePort() noexcept;
   void Clean() noexcept;
 
   const RealmSettings m_settings;
   std::filesystem::path m_folder;
   int m_port = 0;
+  int m_reservedPort = -1; // a socket that keeps other programs of this machine away from the port
   pid_t m_centre = -1;
   int m_centreOutput = -1; // kept open as long as the centre may write to it
 };
