@@ -161,8 +161,11 @@ TEST(Negotiation, FailsWithEachPrefixOfAFinalLeg) {
     GssAcceptor service = world.MakeAcceptor();
     const auto handler = CreateSpnegoHandler(SettingsFor());
     Bytes leg = service.Accept(*handler->NegotiateLeg({}));
-    end = leg.size();
+    end = leg.size(); // legs differ in their lengths by a few bytes
     ASSERT_GT(end, 100u);
+    if (length >= end) {
+      break;
+    }
     leg.resize(length);
     EXPECT_THROW(handler->NegotiateLeg(leg), GssNegotiationException) << "the first " << length << " bytes";
     EXPECT_FALSE(handler->IsMutuallyAuthenticated()) << "the first " << length << " bytes";

@@ -245,7 +245,7 @@ TEST(DoctorTls, RecognisesPlainHttpAtThePort) {
 
 TEST(DoctorTls, EndsForAServerThatHangsOrCloses) {
   const ScriptedServer silent([](ServerConnection &peer) { peer.Stall(); });
-  const Result hung = DoctorOf(silent, "--timeout 1");
+  const Result hung = DoctorOf(silent, "--timeout 5");
   EXPECT_EQ(4, hung.exitCode);
   EXPECT_EQ("failed    The server accepts the connection, but does not end the handshake in time.\n"
             "to do     Look into the server's log, correct the port in --sts, or raise --timeout.\n",

@@ -109,20 +109,20 @@ INSTANTIATE_TEST_SUITE_P(Each, LateFileCommand, testing::ValuesIn(FILE_COMMANDS)
 TEST_F(Ending, IsInTimeAtThePromptAndTheTerminalEchoesAgain) {
   for (const char *command : {"acquire ", "token --cache alice.cache "}) {
     TerminalSession session(
-        ShellCommand("exec ssoclient " + (command + Service()) + "--user alice@corp.example --timeout 0.5"),
+        ShellCommand("exec ssoclient " + (command + Service()) + "--user alice@corp.example --timeout 5"),
         m_folder.Path());
     session.WaitFor("Password for alice@corp.example: ");
     EXPECT_FALSE(session.Echoes());
     EXPECT_EQ(4, session.Finish());
     EXPECT_TRUE(session.Echoes());
-    EXPECT_EQ("Password for alice@corp.example: ssoclient: timed out: the command did not end within 0.5 s, the limit "
+    EXPECT_EQ("Password for alice@corp.example: ssoclient: timed out: the command did not end within 5 s, the limit "
               "of --timeout\r\n",
               session.Shown());
   }
 }
 
 TEST_F(Ending, OfTheDoctorIsInTimeAndItReportsWhatItHasFound) {
-  const Result result = Run("ssoclient doctor " + Service("stall") + "--timeout 1");
+  const Result result = Run("ssoclient doctor " + Service("stall") + "--timeout 5");
   EXPECT_EQ(4, result.exitCode);
   EXPECT_EQ("", result.err);
   EXPECT_THAT(result.out, HasSubstr("\nhttp          failed    "));
@@ -134,7 +134,7 @@ TEST_F(Ending, OfTheDoctorIsInTimeWhileItReadsAFile) {
 }
 
 TEST_F(Ending, IsNotCausedByASignalThatIsIgnored) {
-  TerminalSession session(ShellCommand("trap '' INT; exec ssoclient inspect --timeout 1 fifo"), m_folder.Path());
+  TerminalSession session(ShellCommand("trap '' INT; exec ssoclient inspect --timeout 5 fifo"), m_folder.Path());
   session.WaitUntilItBlocks(SIGTERM);
   session.Signal(SIGINT);
   EXPECT_EQ(4, session.Finish());

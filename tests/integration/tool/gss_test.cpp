@@ -41,7 +41,7 @@ protected:
     EXPECT_EQ("", result.out);
     EXPECT_THAT(result.err, StartsWith("ssoclient: " + ours));
     EXPECT_THAT(result.err.substr(std::min(ours.size(), result.err.size())), HasSubstr(words));
-    EXPECT_EQ(result.err.size() - 1, result.err.find('\n'));
+    EXPECT_EQ(result.err.size() - 1, result.err.find('\n')) << result.err;
     EXPECT_FALSE(std::filesystem::exists(m_folder / "token.xml"));
   }
 };
