@@ -82,8 +82,7 @@ OperationEnding ClientOperation::RunToEnd() {
     if (IsOfParent()) {
       throw CommunicationException("The operation was under way when the process forked: its parent goes on with it");
     }
-    const bool mayFinish = m_isDecided && (!m_isDecidedByStep || m_runningSteps == 0);
-    if (mayFinish && !std::exchange(m_waiter->isEnding, true)) {
+    if (std::exchange(m_waiter->mustFinish, false)) {
       lock.unlock();
       Finish(false);
       lock.lock();
@@ -303,10 +302,11 @@ bool ClientOperation::Decide(OperationEnding ending, bool isByStep) noexcept {
 }
 
 /// Finishes on another thread: neither a thread that cancels nor one that must not block should run the host's code. The
-/// item is urgent, so that it does not wait for the queued steps of other operations.
+/// item is urgent, so that it does not wait for the queued steps of other operations. Called once.
 void ClientOperation::FinishElsewhere() noexcept {
   if (m_waiter) {
     const std::lock_guard<ForkSafeMutex> lock(m_mutex);
+    m_waiter->mustFinish = true;
     m_waiter->changed.notify_one();
     return;
   }

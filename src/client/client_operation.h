@@ -102,8 +102,8 @@ private:
   /// A thread that waits for the operation.
   struct Waiter {
     std::condition_variable_any changed;
-    Step step = nullptr; // to be run by the thread
-    bool isEnding = false;
+    Step step = nullptr;     // to be run by the thread
+    bool mustFinish = false; // set back by the thread when it begins to finish
     bool isOver = false;
   };
 
@@ -177,7 +177,7 @@ private:
 
   mutable Tarvel::ForkSafeMutex m_mutex; // guards what follows
   bool m_isDecided = false;
-  bool m_isDecidedByStep = false; // then it finishes when no step runs, otherwise at once
+  bool m_isDecidedByStep = false; // then the operation finishes when no step runs, otherwise at once
   int m_runningSteps = 0;
   unsigned m_exchange = 0;                                   // the number of the last request
   bool m_isLate = false;                                     // its time-out has passed
