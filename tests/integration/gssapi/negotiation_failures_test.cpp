@@ -6,6 +6,7 @@
 
 #include <gtest/gtest.h>
 
+#include <algorithm>
 #include <ostream>
 #include <string>
 
@@ -161,12 +162,9 @@ TEST(Negotiation, FailsWithEachPrefixOfAFinalLeg) {
     GssAcceptor service = world.MakeAcceptor();
     const auto handler = CreateSpnegoHandler(SettingsFor());
     Bytes leg = service.Accept(*handler->NegotiateLeg({}));
-    end = leg.size(); // legs differ in their lengths by a few bytes
+    end = leg.size();
     ASSERT_GT(end, 100u);
-    if (length >= end) {
-      break;
-    }
-    leg.resize(length);
+    leg.resize(std::min(length, end - 1)); // this leg can be shorter than the one before
     EXPECT_THROW(handler->NegotiateLeg(leg), GssNegotiationException) << "the first " << length << " bytes";
     EXPECT_FALSE(handler->IsMutuallyAuthenticated()) << "the first " << length << " bytes";
   }
