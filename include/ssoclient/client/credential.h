@@ -32,7 +32,9 @@ struct TokenCredential {
 /// A GSS (SPNEGO) negotiation.
 struct NegotiationCredential {
   /// Makes the handler of one negotiation; called once for each attempt. This function and all functions of the handler
-  /// are called on threads of the platform's pool, where they may block. What they throw ends the operation.
+  /// are called on threads of the platform's pool, where they may block. What they throw ends the operation. The operation
+  /// releases the handler before it delivers its result. If it is cancelled or its deadline passes while one of its steps
+  /// runs, such as a function of the handler, it releases the handler when that step ends, on the thread of the step.
   std::function<std::shared_ptr<NegotiationHandler>()> makeHandler;
 };
 
