@@ -29,8 +29,8 @@ constexpr int PORT_TRIALS = 5;
 constexpr int USUAL_CLOCK_SKEW_SEC = 300;
 constexpr int ANY_CLOCK_SKEW_SEC = 1000000;
 
-/// A socket that is bound to a port of 127.0.0.1 of its own, which it sets `port` to. Only programs that ask for this port
-/// and share it, like a centre, can use it as long as the socket is open.
+/// Returns a socket that is bound to a free port of 127.0.0.1, and sets `port` to that port. While the socket is open, no
+/// program is given this port by chance; a centre, which asks for it and can share it, may use it.
 int ReservePort(int &port) {
   const int descriptor = BindLoopback(false, port);
   const int on = 1;

@@ -68,7 +68,7 @@ private:
   const RealmSettings m_settings;
   std::filesystem::path m_folder;
   int m_port = 0;
-  int m_reservedPort = -1; // a socket that keeps other programs of this machine away from the port
+  int m_reservedPort = -1; // a socket that reserves the port
   pid_t m_centre = -1;
   int m_centreOutput = -1; // kept open as long as the centre may write to it
 };

@@ -217,7 +217,7 @@ TEST(TokenClient, NegotiatesManyLegsInOneSession) {
   EXPECT_EQ(handler->received, (Strings{"", "s1", "s2", "final"}));
 }
 
-/// A transport whose thread is still sending when another has read the answer, and the handlers of its negotiations.
+/// A negotiation in which the thread that sends is still sending when another thread has read the answer.
 class SlowSending : public testing::Test {
 protected:
   NegotiationCredential GetCredential() {
