@@ -149,13 +149,15 @@ TEST(SSLStream, SendsTheClosingNoticeWhenItIsClosed) {
       [&](ServerConnection &connection) {
         connection.Handshake();
         connection.Write("x");
+        EXPECT_EQ(connection.ReadExactly(1), "y");
         connection.ReadSome();
         noticed.set_value(connection.ReceivedClosingNotice());
       },
       TlsSettings());
   TlsClient client(CreateTrustingContext(), server.GetPort());
   ASSERT_EQ(client.Handshake(), "");
-  EXPECT_EQ(client.Read(), "x"); // unread bytes would make the kernel send a reset
+  EXPECT_EQ(client.Read(), "x");    // unread bytes would make the kernel send a reset
+  EXPECT_EQ(client.Write("y"), ""); // a write that has not ended would prevent the notice
   client.GetStream()->Close();
   EXPECT_TRUE(noticed.get_future().get());
 }
