@@ -159,16 +159,20 @@ TEST_F(OneSource, SendsOneRequestForManyThreads) {
   ExpectIssued(1);
 }
 
-// The lifetime is so short that the token becomes due while the test waits for the renewal.
+// The token becomes due after two seconds, while the test waits for the renewal. Its lifetime is much longer, so that the
+// token has not expired when a thread or the service is late.
 TEST_F(OneSource, RenewsByItself) {
-  TokenSpec spec = SpecFor(2);
+  TokenSpec spec = SpecFor(20);
   spec.renewable = true;
-  const auto source = Source(spec, {}, "client");
-  EventCount changes;
-  const ChangeRegistration registration = source->OnChange([&](const TokenPtr &) { changes.Add(); });
+  TokenSourceOptions options;
+  options.refreshAt = 0.1;
+  options.jitter = 0;
+  const auto source = Source(spec, options, "client");
+  const auto changes = std::make_shared<EventCount>(); // the function may still run when the test has ended
+  const ChangeRegistration registration = source->OnChange([changes](const TokenPtr &) { changes->Add(); });
   const TokenPtr first = source->Get();
   source->Get(); // without this call, the source would not refresh by itself
-  ASSERT_TRUE(changes.WaitFor(2));
+  ASSERT_TRUE(changes->WaitFor(2));
   EXPECT_NE(source->Get()->GetId(), first->GetId());
   EXPECT_GT(CountLogged("renewed, issued _"), 0) << m_service.GetLog();
 }

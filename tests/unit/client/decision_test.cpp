@@ -87,6 +87,13 @@ private:
   const bool m_isFinal;
 };
 
+/// Destroys the client, and waits until its operations are destroyed, too: a step that still runs would use the clock of
+/// the test, and would write into the log of the next one.
+void ReleaseClient(std::shared_ptr<TokenClient> &client, const std::shared_ptr<Testing::RecordedEvents> &observer) {
+  client = nullptr;
+  EXPECT_TRUE(Testing::Eventually([&observer] { return observer.use_count() == 1; }));
+}
+
 class Decision : public testing::TestWithParam<DecisionCase> {
 protected:
   Decision() {
@@ -110,7 +117,10 @@ protected:
     options.cancelToken = source.GetToken();
     options.deadline = time.GetSteadyTime() + milliseconds(1000);
   }
-  ~Decision() override { gate->Open(); }
+  ~Decision() override {
+    gate->Open();
+    ReleaseClient(client, observer);
+  }
 
   std::function<void()> PassAt(Stage stage) const {
     return [isHere = stage == GetParam().stage, gate = gate] {
@@ -215,6 +225,7 @@ protected:
     client = ClientOn(transport, parts);
     options.cancelToken = source.GetToken();
   }
+  ~HeldClient() override { ReleaseClient(client, observer); }
 
   SteppedTime time;
   const std::shared_ptr<Testing::RecordedEvents> observer = std::make_shared<Testing::RecordedEvents>();

@@ -3,6 +3,7 @@
 #include "unit/observed_service/observed_operations.h"
 
 #include "support/fixed_environment.h"
+#include "support/process_resources.h"
 #include "support/recorded_log.h"
 #include "support/rendezvous.h"
 #include "support/throws_message.h"
@@ -249,6 +250,10 @@ TEST(ObservedAsyncOperation, ReportsItsEndAlsoForAnExceptionOfAForeignClass) {
                                [](const std::shared_ptr<const SamlToken> &, const Tarvel::Exception *) { FAIL(); });
   ASSERT_TRUE(observer->ended.WaitFor(1));
   EXPECT_EQ(observer->className, "int");
+  // The last line of the thread: it would otherwise be in the log of the next test.
+  const std::string last =
+      "Tarvel 8 An exception left a work item of the thread pool: an object that is not a std::exception";
+  EXPECT_TRUE(Eventually([&] { return !log.Lines().empty() && log.Lines().back() == last; }));
 }
 
 TEST(ObservedAsyncOperation, ReportsTheEventsOfEachOperationInOrderWhenManyRunAtOnce) {
