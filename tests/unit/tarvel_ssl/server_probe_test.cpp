@@ -72,8 +72,8 @@ TlsSettings Settings(const std::string &certificate, int version = 0) {
 }
 
 HandshakeProbe Handshake(int port, const Ref<SSLContext> &context, const std::string &host = "localhost",
-                         const std::string &parameter = "", std::int64_t timeout = PATIENCE) {
-  ServerProbe probe = ProbeServer(host, port, context, parameter, timeout);
+                         const std::string &parameter = "") {
+  ServerProbe probe = ProbeServer(host, port, context, parameter, PATIENCE);
   if (!probe.handshake) {
     throw std::runtime_error("no handshake");
   }
@@ -251,9 +251,14 @@ TEST(ProbeServer, KeepsALimitedNumberOfCertificates) {
 
 TEST(ProbeServer, EndsWhenAServerDoesNotAnswerTheHandshake) {
   ScriptedServer server([](ServerConnection &peer) { peer.Stall(); });
-  const HandshakeProbe probe = Handshake(server.GetPort(), CreateTrustingContext(), "localhost", "", IMPATIENCE);
-  EXPECT_EQ(Outcome::TIMED_OUT, probe.outcome);
-  EXPECT_EQ("The TLS handshake with localhost did not end in time", probe.failure);
+  ServerProbe probe;
+  // The connect has the same limit. If it takes longer, because a thread is late, the next probe has more time.
+  for (std::int64_t timeout = IMPATIENCE; !probe.handshake && timeout < PATIENCE; timeout *= 2) {
+    probe = ProbeServer("127.0.0.1", server.GetPort(), CreateTrustingContext(), "", timeout);
+  }
+  ASSERT_TRUE(probe.handshake);
+  EXPECT_EQ(Outcome::TIMED_OUT, probe.handshake->outcome);
+  EXPECT_EQ("The TLS handshake with 127.0.0.1 did not end in time", probe.handshake->failure);
 }
 
 TEST(ProbeServer, TriesEachAddressAndUsesTheFirstThatAnswers) {
