@@ -2,8 +2,10 @@
 // What a probe finds out about a server.
 
 #include "system/name_lookup.h"
+#include "system/shared_lookup.h"
 #include "unit/tarvel_ssl/tls_client.h"
 
+#include "support/rendezvous.h"
 #include "support/throws_message.h"
 #include "support/unavailable_port.h"
 #include "support/work_folder.h"
@@ -15,8 +17,8 @@
 #include <gtest/gtest.h>
 
 #include <cstdint>
+#include <exception>
 #include <future>
-#include <memory>
 #include <stdexcept>
 #include <string>
 #include <vector>
@@ -342,19 +344,21 @@ TEST(ProbeServer, ReportsWhyANameHasNoAddress) {
 }
 
 TEST(ProbeServer, EndsWhenTheResolverDoesNotAnswer) {
-  // The look-up continues after the call, so it shares what it waits for.
-  const auto end = std::make_shared<std::promise<void>>();
-  const auto begun = std::make_shared<std::promise<void>>();
-  const System::ScopedNameLookup lookup(
-      [begun, ended = end->get_future().share()](const std::string &) -> System::AddressList {
-        begun->set_value();
-        ended.wait();
-        throw System::NetworkException("late");
-      });
+  Testing::Gate resolver;
+  const System::ScopedNameLookup lookup([&resolver](const std::string &) -> System::AddressList {
+    resolver.Pass();
+    throw System::NetworkException("late");
+  });
+  // The probe joins a look-up that has begun. If the probe were its only caller and gave up before it began, the
+  // function above would never be called. The completion shows that the function has ended.
+  Testing::EventCount ended;
+  const Ref<System::ScheduledItem> other = System::StartSharedLookup(
+      "slow.example", [&ended](const System::AddressList &, const std::exception_ptr &) { ended.Add(); });
+  EXPECT_TRUE(resolver.WaitForArrivals(1));
   EXPECT_EQ("the resolver did not answer in time",
             ProbeServer("slow.example", 443, nullptr, "", IMPATIENCE).lookupFailure);
-  begun->get_future().wait(); // a look-up that begins after this scope would not call the function above
-  end->set_value();
+  resolver.Open();
+  EXPECT_TRUE(ended.WaitFor(1));
 }
 
 TEST(ProbeServer, NeedsNoContextWithoutTls) {
