@@ -4,6 +4,7 @@
 
 #include "support/completion.h"
 #include "support/process_resources.h"
+#include "support/rendezvous.h"
 #include "support/scripted_server.h"
 #include "system/thread_pool.h"
 
@@ -70,9 +71,10 @@ TEST(ThreadPool, StartsItemsInOrder) {
 }
 
 TEST(ThreadPool, StartsUrgentItemsBeforeTheOthersAndInOrder) {
+  Testing::Gate gate;
   const Ref<ThreadPool> pool = CreateThreadPool(1);
-  Gate gate;
-  pool->QueueWorkItem(gate.Wait());
+  pool->QueueWorkItem([&gate] { gate.Pass(); });
+  ASSERT_TRUE(gate.WaitForArrivals(1)); // otherwise the thread could run an item before it is cancelled
   std::vector<int> order;
   std::promise<void> last;
   pool->QueueWorkItem([&order] { order.push_back(3); });
