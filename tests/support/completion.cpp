@@ -8,6 +8,33 @@
 
 namespace Testing {
 
+namespace {
+
+/// Waits until each I/O thread has run what was queued on it, and all are idle at the same time.
+bool MeetIoThreads() {
+  struct Meeting {
+    std::mutex mutex;
+    std::condition_variable changed;
+    std::size_t present = 0;
+  };
+  const auto meeting = std::make_shared<Meeting>();
+  const auto attend = [meeting] {
+    std::unique_lock<std::mutex> lock(meeting->mutex);
+    ++meeting->present;
+    meeting->changed.notify_all();
+    return meeting->changed.wait_for(lock, PATIENCE,
+                                     [&meeting] { return meeting->present == Tarvel::System::IO_THREADS + 1; });
+  };
+  for (std::size_t thread = 0; thread < Tarvel::System::IO_THREADS; ++thread) {
+    // Twice, because what a handler posts on its own thread is queued only when the handler has returned.
+    boost::asio::io_context &context = Tarvel::System::GetIoContextOf(thread);
+    boost::asio::post(context, [&context, attend] { boost::asio::post(context, attend); });
+  }
+  return attend();
+}
+
+} // namespace
+
 bool Completion::Wait() const {
   std::unique_lock<std::mutex> lock(m_state->mutex);
   return m_state->called.wait_for(lock, PATIENCE, [this] { return m_state->calls > 0; });
@@ -48,25 +75,8 @@ bool Completion::FailedWith(const std::type_info &expected) const {
 }
 
 bool DrainIoThreads() {
-  struct Meeting {
-    std::mutex mutex;
-    std::condition_variable changed;
-    std::size_t present = 0;
-  };
-  const auto meeting = std::make_shared<Meeting>();
-  const auto attend = [meeting] {
-    std::unique_lock<std::mutex> lock(meeting->mutex);
-    ++meeting->present;
-    meeting->changed.notify_all();
-    return meeting->changed.wait_for(lock, PATIENCE,
-                                     [&meeting] { return meeting->present == Tarvel::System::IO_THREADS + 1; });
-  };
-  for (std::size_t thread = 0; thread < Tarvel::System::IO_THREADS; ++thread) {
-    // Twice, because what a handler posts on its own thread is queued only when the handler has returned.
-    boost::asio::io_context &context = Tarvel::System::GetIoContextOf(thread);
-    boost::asio::post(context, [&context, attend] { boost::asio::post(context, attend); });
-  }
-  return attend();
+  // Twice, because a thread may still queue work on another one that waits at the first meeting already.
+  return MeetIoThreads() && MeetIoThreads();
 }
 
 } // namespace Testing

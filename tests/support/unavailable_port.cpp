@@ -12,6 +12,12 @@
 
 namespace Testing {
 
+namespace {
+
+constexpr int WAIT_MILLISECONDS = 60'000;
+
+} // namespace
+
 UnusedPort::UnusedPort() : m_descriptor(BindLoopback(false, m_port)) {}
 
 UnusedPort::~UnusedPort() {
@@ -29,6 +35,11 @@ FullPort::FullPort() : m_listener(BindLoopback(false, m_port)) {
     const int filler = ::socket(AF_INET, SOCK_STREAM | SOCK_CLOEXEC | SOCK_NONBLOCK, 0);
     ::connect(filler, reinterpret_cast<const sockaddr *>(&address), length);
     m_fillers.push_back(filler);
+  }
+  // The kernel may be late: the queue is full when the first connection is in it.
+  pollfd listener{m_listener, POLLIN, 0};
+  if (::poll(&listener, 1, WAIT_MILLISECONDS) != 1) {
+    throw std::runtime_error("full port: no connection arrives");
   }
 }
 

@@ -124,10 +124,9 @@ public:
     AddressProbe probe;
     probe.address = m_address;
     probe.durationMicroseconds = end.durationMicroseconds;
-    if (!end.failure.empty()) {
-      probe.reason = isOverdue ? "there was no answer in time" : WithoutTarget(std::move(end.failure));
-    }
-    probe.outcome = Classify(probe.reason, isOverdue && !probe.reason.empty());
+    // An overdue attempt may have succeeded just before its socket was closed.
+    probe.reason = isOverdue ? "there was no answer in time" : WithoutTarget(std::move(end.failure));
+    probe.outcome = Classify(probe.reason, isOverdue);
     return probe;
   }
 

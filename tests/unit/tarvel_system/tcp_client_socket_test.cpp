@@ -4,6 +4,7 @@
 
 #include "support/completion.h"
 #include "support/process_resources.h"
+#include "support/recorded_log.h"
 #include "support/scripted_server.h"
 #include "system/name_lookup.h"
 
@@ -328,10 +329,12 @@ TEST(TcpClientSocket, HandlersNeverRunInsideTheStartingCall) {
 }
 
 TEST(TcpClientSocket, WorksAfterAHandlerHasThrown) {
+  const Testing::RecordedLog log;
   ScriptedServer server(Echo);
   for (int i = 0; i < 10; ++i) {
     CreateTcpClientSocket()->AsyncConnect("127.0.0.1", server.GetPort(), [](const Exception *) { throw 1; });
   }
+  ASSERT_TRUE(log.WaitForLines(10)); // one for each handler
   EXPECT_EQ(Connect("127.0.0.1", server.GetPort()), "");
 }
 

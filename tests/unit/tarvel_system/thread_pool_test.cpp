@@ -4,6 +4,7 @@
 
 #include "support/completion.h"
 #include "support/process_resources.h"
+#include "support/rendezvous.h"
 #include "support/scripted_server.h"
 #include "system/thread_pool.h"
 
@@ -70,9 +71,10 @@ TEST(ThreadPool, StartsItemsInOrder) {
 }
 
 TEST(ThreadPool, StartsUrgentItemsBeforeTheOthersAndInOrder) {
+  Testing::Gate gate;
   const Ref<ThreadPool> pool = CreateThreadPool(1);
-  Gate gate;
-  pool->QueueWorkItem(gate.Wait());
+  pool->QueueWorkItem([&gate] { gate.Pass(); });
+  ASSERT_TRUE(gate.WaitForArrivals(1)); // otherwise the thread could run an item before it is cancelled
   std::vector<int> order;
   std::promise<void> last;
   pool->QueueWorkItem([&order] { order.push_back(3); });
@@ -115,13 +117,16 @@ TEST(ThreadPool, GrowsToTheCeilingAndNoFurther) {
 }
 
 TEST(ThreadPool, AnIdleThreadTakesTheNextItem) {
-  const Ref<ThreadPool> pool = CreateThreadPool(8, PATIENCE);
-  for (int i = 0; i < 20; ++i) {
+  constexpr std::size_t CEILING = 1000;
+  const Ref<ThreadPool> pool = CreateThreadPool(CEILING, PATIENCE);
+  // An item is done a moment before its thread is idle again, so the pool may start another thread for the next item.
+  EXPECT_TRUE(Eventually([&pool] {
+    const std::size_t before = pool->GetThreadCount();
     const Ref<ScheduledItem> item = pool->QueueWorkItem([] {});
-    ASSERT_TRUE(Eventually([&] { return item->IsDone(); }));
-  }
-  // An item is done a moment before its thread is idle again, so the pool may have started another thread.
-  EXPECT_LE(pool->GetThreadCount(), 3u);
+    EXPECT_TRUE(Eventually([&item] { return item->IsDone(); }));
+    return pool->GetThreadCount() == before;
+  }));
+  EXPECT_LT(pool->GetThreadCount(), CEILING);
 }
 
 TEST(ThreadPool, AnIdleThreadNeverRetiresWhenTheIdleTimeIsEndless) {

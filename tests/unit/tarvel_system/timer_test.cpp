@@ -61,6 +61,10 @@ TEST(Timer, CallsAFunctionWhoseTimeHasPassedSoonButOnAnotherThread) {
 }
 
 TEST(Timer, CallsInTheOrderOfTheTimesNotOfTheStarts) {
+  // A blocked function keeps the others waiting until all are started.
+  Gate gate;
+  StartTimer(Clock::now(), [&gate] { gate.Pass(); });
+  ASSERT_TRUE(gate.WaitForArrivals(1));
   const auto begin = Clock::now() + std::chrono::milliseconds(20);
   std::mutex mutex;
   std::vector<int> order;
@@ -74,6 +78,7 @@ TEST(Timer, CallsInTheOrderOfTheTimesNotOfTheStarts) {
       calls.Add();
     });
   }
+  gate.Open();
   ASSERT_TRUE(calls.WaitFor(5));
   const std::lock_guard<std::mutex> lock(mutex);
   EXPECT_EQ(order, (std::vector<int>{0, 1, 2, 3, 4}));
