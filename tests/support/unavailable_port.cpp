@@ -12,6 +12,12 @@
 
 namespace Testing {
 
+namespace {
+
+constexpr int WAIT_MILLISECONDS = 60000; // far longer than a connection on loopback takes
+
+} // namespace
+
 UnusedPort::UnusedPort() : m_descriptor(BindLoopback(false, m_port)) {}
 
 UnusedPort::~UnusedPort() {
@@ -29,6 +35,11 @@ FullPort::FullPort() : m_listener(BindLoopback(false, m_port)) {
     const int filler = ::socket(AF_INET, SOCK_STREAM | SOCK_CLOEXEC | SOCK_NONBLOCK, 0);
     ::connect(filler, reinterpret_cast<const sockaddr *>(&address), length);
     m_fillers.push_back(filler);
+  }
+  // The kernel may deliver the fillers later than a connection of the test, which would then be accepted.
+  pollfd listener{m_listener, POLLIN, 0};
+  if (::poll(&listener, 1, WAIT_MILLISECONDS) != 1) {
+    throw std::runtime_error("full port: the queue does not fill");
   }
 }
 
