@@ -1,6 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 // How waiting calls end: deadline, cancellation, destruction, executors, threads.
 
+#include "support/process_resources.h"
 #include "support/recorded_log.h"
 #include "support/rendezvous.h"
 #include "support/throws_message.h"
@@ -201,9 +202,12 @@ TEST(TokenSourceCall, CallsBackOnAThreadOfTheLibraryWhenTheExecutorRefuses) {
     EXPECT_EQ(DescribeOutcome(outcome), "first");
     called.Add();
   });
-  stage.issuer->Answer(stage.Token("first", 1000s));
+  const auto token = stage.Token("first", 1000s);
+  stage.issuer->Answer(token);
   EXPECT_TRUE(called.WaitFor(1));
   EXPECT_THAT(log.Lines(), ElementsAre("SsoClient 8 An executor threw runtime_error: the loop has ended"));
+  stage.Close();
+  EXPECT_TRUE(Eventually([&] { return token.use_count() == 1; })) << "the thread has released its token, too";
 }
 
 TEST(TokenSourceCall, SurvivesACallbackThatThrows) {
