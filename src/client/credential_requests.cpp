@@ -13,6 +13,9 @@ CredentialRequests::CredentialRequests(CredentialProvider provider, Executor blo
 void CredentialRequests::Request(Callback callback) {
   {
     const std::lock_guard<Tarvel::ForkSafeMutex> lock(m_mutex);
+    if (m_isClosed) {
+      return;
+    }
     std::swap(m_waiting, callback); // the earlier one is destroyed outside the lock
     if (m_isCalling) {
       return;
@@ -29,7 +32,15 @@ void CredentialRequests::Request(Callback callback) {
   }
 }
 
+bool CredentialRequests::IsClosed() noexcept {
+  const std::lock_guard<Tarvel::ForkSafeMutex> lock(m_mutex);
+  return m_isClosed;
+}
+
 void CredentialRequests::Call() noexcept {
+  if (IsClosed()) {
+    return; // what the provider refers to may have been destroyed together with the source
+  }
   Outcome<std::shared_ptr<const Credential>> outcome{std::exception_ptr()};
   try {
     outcome = std::make_shared<const Credential>(m_provider());
@@ -45,6 +56,13 @@ void CredentialRequests::Call() noexcept {
   if (callback) {
     callback(outcome);
   }
+}
+
+void CredentialRequests::Close() noexcept {
+  Callback dropped; // destroyed outside the lock
+  const std::lock_guard<Tarvel::ForkSafeMutex> lock(m_mutex);
+  m_isClosed = true;
+  std::swap(dropped, m_waiting);
 }
 
 void CredentialRequests::ForgetCall() noexcept {

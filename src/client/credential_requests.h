@@ -25,13 +25,18 @@ public:
   CredentialRequests(CredentialProvider provider, Executor blocking);
 
   /// Calls `callback` with the next credential, on the thread of the provider. It replaces an earlier callback that still waits.
+  /// After `Close` it does nothing.
   /// @throws what the executor throws, `std::bad_alloc`; the callback is not called then
   void Request(Callback callback);
+
+  /// Calls neither the provider nor a callback from now on; a call of the provider that is under way continues.
+  void Close() noexcept;
 
   /// In a child of `fork`: the call of the parent does not exist here.
   void ForgetCall() noexcept;
 
 private:
+  bool IsClosed() noexcept;
   void Call() noexcept;
 
   const CredentialProvider m_provider;
@@ -39,6 +44,7 @@ private:
   Tarvel::ForkSafeMutex m_mutex; // guards all that follows
   Callback m_waiting;            // null if no attempt waits
   bool m_isCalling = false;
+  bool m_isClosed = false;
 };
 
 } // namespace SsoClient

@@ -60,8 +60,8 @@ std::function<void()> RefreshAttempt::MakeStep(Step step) {
 void RefreshAttempt::StartTimer() {
   auto timer = m_supplies->time.StartTimer(m_deadline, [weak = weak_from_this()] {
     if (const std::shared_ptr<RefreshAttempt> self = weak.lock()) {
-      self->m_cancel.Cancel();
       self->Fail(std::make_exception_ptr(DeadlineExceededException("The deadline passed before the operation ended")));
+      self->m_cancel.Cancel(); // afterwards: a request that ends at once because of it does not decide the outcome
     }
   });
   {

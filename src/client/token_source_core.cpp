@@ -309,6 +309,7 @@ std::shared_ptr<void> TokenSourceCore::OnChange(ChangeListeners::Function functi
 
 void TokenSourceCore::Close() noexcept {
   m_listeners->Close();
+  m_supplies->credentials->Close();
   std::shared_ptr<RefreshAttempt> attempt;
   Waiters waiters;
   {

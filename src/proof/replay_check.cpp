@@ -45,6 +45,10 @@ void RequireFirstReceipt(ReplayGuard &guard, const MessageIdentifier &identifier
                          const Tarvel::System::DateTime &until) {
   switch (Ask(guard, identifier, until)) {
   case ReplayGuard::Answer::FIRST:
+    // At `until` the guard may have forgotten an earlier receipt, and it may have answered only then.
+    if (!(Tarvel::System::GetUtcDateTime() < until)) {
+      throw StaleMessageException("The message became too old before the replay guard had answered");
+    }
     return;
   case ReplayGuard::Answer::REPEATED:
     throw RepeatedMessageException("The message was received before");

@@ -32,6 +32,8 @@ MessageIdentifier IdentifyMessage(std::string_view signedAs, const std::vector<s
 /// so that a message that is refused takes no place in the guard.
 /// @param until the first moment at which the message is stale
 /// @throws RepeatedMessageException when the guard has received the message before.
+/// @throws StaleMessageException when the guard has answered at `until` or later: it may then have forgotten the
+///         message.
 /// @throws ReplayGuardException when it is not available, or throws.
 void RequireFirstReceipt(ReplayGuard &guard, const MessageIdentifier &identifier,
                          const Tarvel::System::DateTime &until);

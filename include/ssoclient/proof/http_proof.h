@@ -78,7 +78,8 @@ struct VerifiedHttpRequest {
 /// @throws InvalidProofException when there is no signature by the token's key, or its `alg` is another one; when the
 ///         request was changed after it was signed; for a bearer token, a token without a key that can be used, and a
 ///         key for which there is no algorithm.
-/// @throws StaleMessageException when `created` is too long ago or in the future, or `expires` has passed.
+/// @throws StaleMessageException when `created` is too long ago or in the future, or `expires` has passed, also if
+///         that happens before the replay guard answers.
 /// @throws RepeatedMessageException, ReplayGuardException by the replay guard, which is asked only about requests that
 ///         are otherwise accepted.
 /// @throws what `TokenVerifier::Verify` throws, for the token.

@@ -118,7 +118,8 @@ public:
   ///         in that header refers to another token, or to the token and something else; when two signatures refer to
   ///         the token, or there are more than 10; when the token has no canonical form; and when a required part is
   ///         missing, is there twice or is not covered.
-  /// @throws StaleMessageException when the timestamp is in the future, has expired or is too old.
+  /// @throws StaleMessageException when the timestamp is in the future, has expired or is too old, also if it has
+  ///         become so before the replay guard answers.
   /// @throws ParseException and InvalidSignatureException, for the token, like `TokenVerifier::Verify`.
   /// @throws InvalidProofException when the token's key did not sign the message and the sender did not authenticate
   ///         with it in TLS; when the signature is wrong or outside the profile; and for a bearer token, unless the

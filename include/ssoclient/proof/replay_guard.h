@@ -32,7 +32,8 @@ public:
   /// Remembers the message, at least until `until`, and answers whether it was known. Both happen in one step: of
   /// several calls with one identifier at the same time, at most one is answered FIRST. The function may block, for
   /// example on the network. If it throws, the message is refused by a `ReplayGuardException`, like after
-  /// UNAVAILABLE.
+  /// UNAVAILABLE. If it returns FIRST at `until` or later, when it may have forgotten the message, the message is
+  /// refused by a `StaleMessageException`.
   virtual Answer Remember(const MessageIdentifier &identifier, const Tarvel::System::DateTime &until) = 0;
 
 protected:

@@ -4,6 +4,7 @@
 
 #include "support/data_file.h"
 #include "support/throws_message.h"
+#include "unit/replay_guard/guarded_clock.h"
 
 #include <ssoclient/proof/exceptions.h>
 #include <tarvel/core/ref.h>
@@ -18,6 +19,7 @@
 namespace {
 
 using namespace SsoClient;
+using ReplayGuardTest::SetClock;
 using Tarvel::Ref;
 using Tarvel::Crypto::VerifyingKey;
 using Tarvel::System::DateTime;
@@ -73,7 +75,35 @@ private:
 constexpr MessageIdentifier IDENTIFIER{1, 2, 3};
 const DateTime UNTIL("2026-01-01T00:06:00Z");
 
+/// Needs time for its answer: the clock then shows the time that the test chooses.
+class SlowGuard final : public ReplayGuard {
+public:
+  SlowGuard(SetClock &clock, std::int64_t afterwards) : m_clock(clock), m_afterwards(afterwards) {}
+
+  Answer Remember(const MessageIdentifier &, const DateTime &) override {
+    m_clock.Set(m_afterwards);
+    return Answer::FIRST;
+  }
+
+private:
+  SetClock &m_clock;
+  const std::int64_t m_afterwards;
+};
+
+TEST(RequireFirstReceipt, RefusesAMessageThatBecomesStaleBeforeTheGuardAnswers) {
+  const std::int64_t until = UNTIL.GetUtcTime();
+  SetClock clock(until - 2);
+  for (const std::int64_t late : {until, until + 1}) {
+    SlowGuard guard(clock, late);
+    EXPECT_THROWS_MESSAGE(RequireFirstReceipt(guard, IDENTIFIER, UNTIL), StaleMessageException,
+                          "The message became too old before the replay guard had answered");
+  }
+  SlowGuard inTime(clock, until - 1);
+  EXPECT_NO_THROW(RequireFirstReceipt(inTime, IDENTIFIER, UNTIL));
+}
+
 TEST(RequireFirstReceipt, PassesTheIdentifierAndTheTimeToTheGuard) {
+  const SetClock clock(UNTIL.GetUtcTime() - 1);
   AnsweringGuard guard(ReplayGuard::Answer::FIRST);
   RequireFirstReceipt(guard, IDENTIFIER, UNTIL);
   EXPECT_EQ(IDENTIFIER, guard.lastIdentifier);

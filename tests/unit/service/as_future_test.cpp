@@ -192,7 +192,7 @@ TEST(AsFuture, NeitherWaitsNorFailsWhenTheFutureIsDestroyedFirst) {
   AsFuture(*ServiceOn(transport), &Service::AcquireTokenByCertificateAsync, SpecFor(60));
   ASSERT_TRUE(gate->WaitForArrivals(1));
   gate->Open();
-  // The operation ends without a failure, and before the next test, which may record the log.
+  // The operation ends before the test, because its log is not for the next one.
   EXPECT_TRUE(Testing::Eventually([&transport] { return transport.use_count() == 1; }));
 }
 

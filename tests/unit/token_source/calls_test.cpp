@@ -1,6 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 // How waiting calls end: deadline, cancellation, destruction, executors, threads.
 
+#include "support/process_resources.h"
 #include "support/recorded_log.h"
 #include "support/rendezvous.h"
 #include "support/throws_message.h"
@@ -201,9 +202,12 @@ TEST(TokenSourceCall, CallsBackOnAThreadOfTheLibraryWhenTheExecutorRefuses) {
     EXPECT_EQ(DescribeOutcome(outcome), "first");
     called.Add();
   });
-  stage.issuer->Answer(stage.Token("first", 1000s));
+  const auto token = stage.Token("first", 1000s);
+  stage.issuer->Answer(token);
   EXPECT_TRUE(called.WaitFor(1));
   EXPECT_THAT(log.Lines(), ElementsAre("SsoClient 8 An executor threw runtime_error: the loop has ended"));
+  stage.Close();
+  EXPECT_TRUE(Eventually([&] { return token.use_count() == 1; })) << "the thread has released its token, too";
 }
 
 TEST(TokenSourceCall, SurvivesACallbackThatThrows) {
@@ -228,69 +232,6 @@ TEST(TokenSourceCall, MayAskAgainWithinItsCallback) {
   stage.issuer->Answer(stage.Token("first", 1000s));
   stage.issuer->Answer(stage.Token("second", 1000s));
   EXPECT_THAT(outcomes.Get(), ElementsAre("second"));
-}
-
-TEST(CredentialProvider, IsAskedForEachAcquisition) {
-  SourceStage stage;
-  int calls = 0;
-  stage.provider = [&] { return PasswordCredential{"alice" + std::to_string(++calls), Tarvel::SecretText("x")}; };
-  stage.Provide(stage.Token("first", 1000s));
-  stage.Source().Invalidate("first");
-  stage.Provide(stage.Token("second", 1000s));
-  EXPECT_THAT(stage.issuer->GetTexts(), ElementsAre("acquire alice1", "acquire alice2"));
-}
-
-TEST(CredentialProvider, EndsTheAttemptWithWhatItThrows) {
-  SourceStage stage;
-  stage.provider = []() -> Credential { throw std::runtime_error("the vault is sealed"); };
-  EXPECT_EQ(stage.Ask(), "another: the vault is sealed");
-  EXPECT_EQ(stage.issuer->Count(), 0U);
-}
-
-TEST(CredentialProvider, ThatBlocksIsNotCalledTwiceAndTheNextAttemptGetsItsCredential) {
-  SourceStage stage;
-  stage.options.attemptTimeout = 5s;
-  std::deque<std::function<void()>> blocked;
-  stage.blocking = [&](std::function<void()> function) { blocked.push_back(std::move(function)); };
-  OutcomeList outcomes;
-  stage.Source().GetAsync({}, CancelToken(), outcomes.MakeCallback());
-  stage.time.Advance(5s);
-  EXPECT_THAT(outcomes.Get(), ElementsAre(LATE));
-  stage.time.Advance(1s);
-  EXPECT_EQ(stage.Ask(), "waits");
-  EXPECT_EQ(blocked.size(), 1U);
-  EXPECT_EQ(stage.issuer->Count(), 0U);
-  blocked.front()();
-  EXPECT_EQ(stage.issuer->Count(), 1U);
-  stage.issuer->Answer(stage.Token("first", 1000s));
-  EXPECT_EQ(stage.Ask(), "first");
-}
-
-TEST(CredentialProvider, ThatReturnsAfterTheSourceWasDestroyedCausesNoRequest) {
-  SourceStage stage;
-  std::deque<std::function<void()>> blocked;
-  stage.blocking = [&](std::function<void()> function) { blocked.push_back(std::move(function)); };
-  EXPECT_EQ(stage.Ask(), "waits");
-  stage.Close();
-  EXPECT_EQ(stage.issuer.use_count(), 1) << "a provider that blocks does not keep the attempt";
-  blocked.front()();
-  EXPECT_EQ(stage.issuer->Count(), 0U);
-}
-
-TEST(CredentialProvider, ThatCannotBeCalledEndsTheAttempt) {
-  SourceStage stage;
-  bool isRefused = true;
-  stage.blocking = [&](const std::function<void()> &function) {
-    if (isRefused) {
-      throw Tarvel::InvalidStateException("There is no thread");
-    }
-    function();
-  };
-  EXPECT_EQ(stage.Ask(), "another: There is no thread");
-  isRefused = false;
-  stage.time.Advance(1s);
-  EXPECT_EQ(stage.Ask(), "waits");
-  EXPECT_EQ(stage.issuer->Count(), 1U);
 }
 
 TEST(TokenSourceOnChange, CallsTheFunctionsInOrderWithEachNewToken) {

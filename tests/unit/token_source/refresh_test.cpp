@@ -195,6 +195,29 @@ TEST(TokenSourceRefresh, EndsAnAttemptAfterItsTimeAndCancelsTheRequest) {
   EXPECT_EQ(stage.Ask(), "waits") << "what arrives later is ignored";
 }
 
+TEST(TokenSourceRefresh, ReportsThatItsTimeIsOverEvenIfTheRequestEndsAtOnceWhenItIsCancelled) {
+  SourceStage stage;
+  stage.options.attemptTimeout = 5s;
+  OutcomeList outcomes;
+  stage.Source().GetAsync({}, CancelToken(), outcomes.MakeCallback());
+  const CancelRegistration registration =
+      stage.issuer->GetCancelToken().OnCancel([&] { stage.issuer->Answer(Failure("cancelled")); });
+  stage.time.Advance(5s);
+  EXPECT_THAT(outcomes.Get(), ElementsAre("DeadlineExceededException: The deadline passed before the operation ended"));
+}
+
+TEST(TokenSourceRefresh, DoesNotAcquireWhenARenewalEndsBecauseItsTimeIsOver) {
+  SourceStage stage;
+  stage.options.attemptTimeout = 5s;
+  stage.Provide(stage.Token("first", 1000s, DatedToken::Kind::RENEWABLE));
+  stage.time.Advance(800s);
+  EXPECT_EQ(stage.Ask(), "first");
+  const CancelRegistration registration =
+      stage.issuer->GetCancelToken().OnCancel([&] { stage.issuer->Answer(Failure("cancelled")); });
+  stage.time.Advance(5s);
+  EXPECT_THAT(stage.issuer->GetTexts(), ElementsAre("acquire alice", "renew first 3600"));
+}
+
 TEST(TokenSourceClock, SetForwardEndsTheTokenAtOnce) {
   SourceStage stage;
   stage.Provide(stage.Token("first", 1000s));

@@ -60,6 +60,11 @@ void ManualIssuer::Forget() {
   forgotten.swap(m_open);
 }
 
+CancelToken ManualIssuer::GetCancelToken() const {
+  const std::lock_guard<std::mutex> lock(m_mutex);
+  return m_open.at(0).options.cancelToken;
+}
+
 void ManualIssuer::Answer(const TokenOutcome &outcome) {
   Request request;
   {

@@ -39,6 +39,9 @@ public:
   /// The requests that have been neither answered nor cancelled.
   std::size_t CountOpen() const;
 
+  /// What cancels the oldest request that has not been answered.
+  SsoClient::CancelToken GetCancelToken() const;
+
   /// Answers the oldest request that has not been answered.
   void Answer(const SsoClient::TokenOutcome &outcome);
 
