@@ -1,7 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 // A test preloads this into the tool. When the tool has written a file that does not have its final name yet, this
-// `fsync` sends the process the signal SIGNAL_AT_FSYNC of the environment, and then takes as long as that of a slow disk.
-// If SECOND_SIGNAL_AT_FSYNC is set, it sends that signal, too, and never returns.
+// `fsync` sends the process the signal SIGNAL_AT_FSYNC of the environment, and then takes as long as on a slow disk. If
+// SECOND_SIGNAL_AT_FSYNC is set, it sends that signal, too, and never returns.
 
 #include <csignal>
 #include <cstdlib>
