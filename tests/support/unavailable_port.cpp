@@ -12,6 +12,12 @@
 
 namespace Testing {
 
+namespace {
+
+constexpr int PATIENCE_MILLISECONDS = 60000;
+
+} // namespace
+
 UnusedPort::UnusedPort() : m_descriptor(BindLoopback(false, m_port)) {}
 
 UnusedPort::~UnusedPort() {
@@ -29,6 +35,10 @@ FullPort::FullPort() : m_listener(BindLoopback(false, m_port)) {
     const int filler = ::socket(AF_INET, SOCK_STREAM | SOCK_CLOEXEC | SOCK_NONBLOCK, 0);
     ::connect(filler, reinterpret_cast<const sockaddr *>(&address), length);
     m_fillers.push_back(filler);
+  }
+  pollfd listener{m_listener, POLLIN, 0}; // the system may deliver the fillers' segments later than this returns
+  if (::poll(&listener, 1, PATIENCE_MILLISECONDS) != 1) {
+    throw std::runtime_error("full port: the queue is not full");
   }
 }
 
