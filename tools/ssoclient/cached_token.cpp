@@ -12,9 +12,6 @@
 #include <future>
 #include <utility>
 
-#include <sys/stat.h>
-#include <unistd.h>
-
 namespace SsoClient::Tool {
 namespace {
 
@@ -40,22 +37,6 @@ std::shared_ptr<const SamlToken> Get(const TokenSource &source, const std::share
   });
   tasks->RunUntil(isDone);
   return result->Get();
-}
-
-/// After a cancelled call, the library may still write the cache file. Waits for that, so that no unfinished file is
-/// left.
-void AwaitCacheFile(const std::string &path) {
-  constexpr int PATIENCE = 1000;
-  constexpr useconds_t TURN_MICROSECONDS = 1000;
-  const std::string replacement = path + ".new"; // see `Tarvel::PrivateFileLock::Replace`
-  const UnfinishedFile unfinished([&path] { return path + ".new"; });
-  const auto exists = [&replacement] {
-    struct stat status = {};
-    return lstat(replacement.c_str(), &status) == 0;
-  };
-  for (int turn = 0; turn < PATIENCE && exists() && !Tarvel::PrivateFile(path).TryLock(); ++turn) {
-    usleep(TURN_MICROSECONDS);
-  }
 }
 
 IssuedToken GetFrom(const TokenSource &source, const CachedTokenCall &call, const std::shared_ptr<TaskQueue> &tasks) {
@@ -86,6 +67,7 @@ IssuedToken GetCachedToken(const CachedTokenCall &call) {
   const auto provider = [tasks, credential = call.credential] { return AskMainThread(*tasks, credential); };
   TokenSourceOptions options;
   options.cache = call.cache;
+  AwaitReplacementOf(call.cache.path);
   try {
     const TokenSource source(call.client, provider, call.spec, options);
     IssuedToken issued = GetFrom(source, call, tasks);
@@ -96,9 +78,6 @@ IssuedToken GetCachedToken(const CachedTokenCall &call) {
     return issued;
   } catch (...) {
     tasks->Close();
-    if (call.watch->GetAskedAt()) {
-      AwaitCacheFile(call.cache.path);
-    }
     throw;
   }
 }

@@ -6,6 +6,8 @@
 #include "quiet_terminal.h"
 
 #include <ssoclient/client/exceptions.h>
+#include <tarvel/core/exception.h>
+#include <tarvel/io/private_file.h>
 
 #include <atomic>
 #include <cerrno>
@@ -16,6 +18,7 @@
 
 #include <poll.h>
 #include <pthread.h>
+#include <sys/stat.h>
 #include <unistd.h>
 
 namespace SsoClient::Tool {
@@ -30,6 +33,8 @@ constexpr int ENDING_SIGNALS[] = {SIGINT, SIGTERM, SIGHUP, SIGQUIT};
 constexpr microseconds GRACE{20'000};
 /// How often a thread that waits for a file checks whether the file is complete.
 constexpr microseconds TURN{1'000};
+/// How often a thread checks that before it stops waiting: the lock can be that of another process.
+constexpr int MAX_TURNS = 10'000;
 
 // Why the process ends early: one of these, or the number of a signal.
 constexpr int NOTHING = 0;
@@ -37,8 +42,9 @@ constexpr int TOO_LATE = -1;
 std::atomic<int> g_cause{NOTHING};
 
 std::mutex g_writing; // locked while a file is not complete, and for the rest of the process after the command
-std::mutex g_naming;  // protects the path
+std::mutex g_naming;  // protects the paths
 std::string g_unfinishedPath;
+std::string g_replacedPath; // of a file that the library may replace; empty for none
 
 // Set before there is a second thread.
 sigset_t g_ending;   // the signals that end the process
@@ -123,6 +129,22 @@ void ReportLateness() {
   }
 }
 
+/// The path at which the library makes the new content of a file (see `Tarvel::PrivateFileLock::Replace`).
+std::string ReplacementOf(const std::string &path) {
+  return path + ".new";
+}
+
+/// Whether a thread or another process is replacing the file at `path`. A process that was killed leaves a replacement,
+/// but no lock.
+bool IsBeingReplaced(const std::string &path) {
+  struct stat status = {};
+  try {
+    return !path.empty() && lstat(ReplacementOf(path).c_str(), &status) == 0 && !Tarvel::PrivateFile(path).TryLock();
+  } catch (const Tarvel::Exception &) { // it is not a private file
+    return false;
+  }
+}
+
 /// Waits until no file is unfinished. After a second signal, removes the file instead.
 /// @param isImpatient whether the second signal has already arrived
 void CompleteFile(bool isImpatient) {
@@ -130,6 +152,13 @@ void CompleteFile(bool isImpatient) {
     if (isImpatient || IsInterruptedWithin(TURN)) {
       g_naming.lock(); // never unlocked: no further file is made
       unlink(g_unfinishedPath.c_str());
+      return;
+    }
+  }
+  g_naming.lock();
+  for (int turn = 0; turn < MAX_TURNS && IsBeingReplaced(g_replacedPath); ++turn) {
+    if (isImpatient || IsInterruptedWithin(TURN)) {
+      unlink(ReplacementOf(g_replacedPath).c_str());
       return;
     }
   }
@@ -233,6 +262,11 @@ void ReportAndFinish(const std::exception &failure, Format format) {
     ReportFailure(failure, format);
   }
   FinishCommand();
+}
+
+void AwaitReplacementOf(const std::string &path) {
+  const std::lock_guard<std::mutex> naming(g_naming);
+  g_replacedPath = path;
 }
 
 UnfinishedFile::UnfinishedFile(const std::function<std::string()> &create) {

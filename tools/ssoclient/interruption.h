@@ -42,6 +42,11 @@ void FinishCommand();
 /// the command, nothing is reported; if the time was over, only that is reported.
 void ReportAndFinish(const std::exception &failure, Format format);
 
+/// From now on, a signal or the end of the time takes effect only when the library is not replacing the private file at
+/// `path`: it may still write a token after a cancelled call. A second signal removes the unfinished file. Call it at
+/// most once.
+void AwaitReplacementOf(const std::string &path);
+
 /// While it lives, a file exists that is not complete or does not have its final name. Signals take effect afterwards.
 class UnfinishedFile {
 public:

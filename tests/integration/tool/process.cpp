@@ -97,16 +97,20 @@ void Drain(Pipe &pipe, std::string &text) {
   text.append(buffer.data(), static_cast<std::size_t>(count));
 }
 
+/// What happens to the standard input of a process when all input is written.
+enum class Input { ENDS, STAYS_OPEN };
+
 /// Writes `input` and reads both outputs at the same time, so that neither side blocks the other.
-void Exchange(Process &process, std::string_view input, Result &result) {
+void Exchange(Process &process, std::string_view input, Result &result, Input atEnd = Input::ENDS) {
   std::signal(SIGPIPE, SIG_IGN);
   fcntl(process.in.writeEnd, F_SETFL, O_NONBLOCK);
-  if (input.empty()) {
+  if (input.empty() && atEnd == Input::ENDS) {
     process.in.CloseWrite();
   }
   while (process.out.readEnd >= 0 || process.err.readEnd >= 0) {
-    std::array<pollfd, 3> polled{
-        {{process.in.writeEnd, POLLOUT, 0}, {process.out.readEnd, POLLIN, 0}, {process.err.readEnd, POLLIN, 0}}};
+    std::array<pollfd, 3> polled{{{input.empty() ? -1 : process.in.writeEnd, POLLOUT, 0},
+                                  {process.out.readEnd, POLLIN, 0},
+                                  {process.err.readEnd, POLLIN, 0}}};
     poll(polled.data(), polled.size(), -1);
     if (polled[0].revents) {
       Feed(process.in, input);
@@ -187,6 +191,7 @@ Result RunToolAndSignal(const std::vector<std::string> &arguments, int signal) {
     usleep(1000);
   }
   kill(process.id, signal);
+  Exchange(process, {}, result, Input::STAYS_OPEN);
   Finish(process, result);
   return result;
 }
