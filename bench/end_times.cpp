@@ -11,6 +11,7 @@
 #include <chrono>
 #include <future>
 #include <stdexcept>
+#include <thread>
 #include <vector>
 
 namespace Bench {
@@ -18,6 +19,8 @@ namespace Bench {
 namespace {
 
 using Clock = std::chrono::steady_clock;
+
+constexpr std::chrono::minutes LONGEST_START{1}; // for acquisitions to be under way before their deadlines
 
 /// When an acquisition has ended. It must end with an exception of the class `Expected`.
 template <typename Expected>
@@ -55,6 +58,32 @@ double Milliseconds(Clock::duration time) {
   return std::chrono::duration<double, std::milli>(time).count();
 }
 
+struct DeadlineRun {
+  std::vector<double> times;    ///< by how many milliseconds each acquisition ended after its deadline
+  bool wereAllUnderWay = false; ///< before the first deadline
+};
+
+/// Starts acquisitions whose deadlines are a millisecond apart, and waits for their ends.
+DeadlineRun RunDeadlines(const Testing::HeldServer &server, const SsoClient::TokenClient &client, std::size_t count,
+                         Clock::time_point first) {
+  const int all = server.CountRequests() + static_cast<int>(count);
+  std::vector<End<SsoClient::DeadlineExceededException>> ends(count);
+  for (std::size_t i = 0; i < count; ++i) {
+    SsoClient::CallOptions options;
+    options.deadline = first + i * std::chrono::milliseconds(1);
+    client.AcquireAsync(GetCredential(), GetCrowdSpec(), options, ends[i].GetCallback());
+  }
+  while (server.CountRequests() < all && Clock::now() < first) {
+    std::this_thread::sleep_for(std::chrono::milliseconds(1));
+  }
+  DeadlineRun run;
+  run.wereAllUnderWay = server.CountRequests() >= all && Clock::now() < first;
+  for (std::size_t i = 0; i < count; ++i) {
+    run.times.push_back(Milliseconds(ends[i].Wait() - (first + i * std::chrono::milliseconds(1))));
+  }
+  return run;
+}
+
 } // namespace
 
 EndTimes MeasureCancel(const Testing::HeldServer &server, std::size_t underWay, std::size_t samples) {
@@ -87,23 +116,14 @@ EndTimes MeasureCancel(const Testing::HeldServer &server, std::size_t underWay, 
 
 EndTimes MeasureDeadline(const Testing::HeldServer &server, std::size_t count) {
   const auto client = ConnectTo(server);
-  const int before = server.CountRequests();
-  std::vector<End<SsoClient::DeadlineExceededException>> ends(count);
-  const Clock::time_point first = Clock::now() + std::chrono::milliseconds(500) + count * std::chrono::milliseconds(1);
-  for (std::size_t i = 0; i < count; ++i) {
-    SsoClient::CallOptions options;
-    options.deadline = first + i * std::chrono::milliseconds(1);
-    client->AcquireAsync(GetCredential(), GetCrowdSpec(), options, ends[i].GetCallback());
+  Clock::duration start = std::chrono::milliseconds(500) + count * std::chrono::milliseconds(1);
+  for (; start < LONGEST_START; start *= 2) {
+    const DeadlineRun run = RunDeadlines(server, *client, count, Clock::now() + start);
+    if (run.wereAllUnderWay) {
+      return Summarise(run.times);
+    }
   }
-  WaitForRequests(server, before + static_cast<int>(count));
-  if (Clock::now() > first) {
-    throw std::runtime_error("the machine is too slow: a deadline has passed before all requests were under way");
-  }
-  std::vector<double> times;
-  for (std::size_t i = 0; i < count; ++i) {
-    times.push_back(Milliseconds(ends[i].Wait() - (first + i * std::chrono::milliseconds(1))));
-  }
-  return Summarise(times);
+  throw std::runtime_error("the machine is too slow: a deadline has passed before all requests were under way");
 }
 
 } // namespace Bench

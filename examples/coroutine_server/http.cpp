@@ -26,7 +26,7 @@ namespace http = boost::beast::http;
 using asio::use_awaitable;
 using boost::beast::tcp_stream;
 
-constexpr std::chrono::seconds ALLOWED(5);
+constexpr std::chrono::seconds ALLOWED(10);
 constexpr std::size_t MAX_BODY = 1u << 20; // a token has some kilobytes
 
 asio::awaitable<void> AnswerOne(tcp_stream stream, const Handler &handler) {

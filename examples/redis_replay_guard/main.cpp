@@ -27,7 +27,7 @@ namespace {
 
 enum ExitCode { ACCEPTED = 0, REFUSED = 1, USAGE = 2, FAILED = 3 };
 
-constexpr std::chrono::milliseconds REDIS_TIMEOUT(500);
+constexpr std::chrono::seconds REDIS_TIMEOUT(10); // less for a service with many callers
 
 std::string ReadFile(const std::string &path) {
   std::ifstream file(path, std::ios::binary);

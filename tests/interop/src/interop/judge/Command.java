@@ -23,7 +23,7 @@ final class Command {
     }
   }
 
-  private static final int LIMIT_SECONDS = 60;
+  private static final int LIMIT_SECONDS = 120;
 
   private Command() {
   }
