@@ -39,7 +39,7 @@ bool CredentialRequests::IsClosed() noexcept {
 
 void CredentialRequests::Call() noexcept {
   if (IsClosed()) {
-    return; // what the provider refers to may have been destroyed together with the source
+    return; // this thread was late, and the host may have destroyed what the provider refers to
   }
   Outcome<std::shared_ptr<const Credential>> outcome{std::exception_ptr()};
   try {

@@ -29,7 +29,8 @@ public:
   /// @throws what the executor throws, `std::bad_alloc`; the callback is not called then
   void Request(Callback callback);
 
-  /// Calls neither the provider nor a callback from now on; a call of the provider that is under way continues.
+  /// From now on, no call of the provider or of a callback begins. One that is just beginning on another thread
+  /// continues.
   void Close() noexcept;
 
   /// In a child of `fork`: the call of the parent does not exist here.

@@ -125,8 +125,8 @@ public:
   TokenSource(const TokenSource &) = delete;
   TokenSource &operator=(const TokenSource &) = delete;
   /// Cancels what is under way, and does not wait. Each call that waits ends with `CancelledException`, on its
-  /// executor. A provider that is being called continues, and its credential is released. No further call of the
-  /// provider begins.
+  /// executor. No further call of the provider begins. One that is under way, or is just beginning on another thread,
+  /// continues, and its credential is released; so the provider must own what it uses.
   ~TokenSource();
 
   /// The token, never null. Waits if there is no token that can be returned. Safe on any thread.
