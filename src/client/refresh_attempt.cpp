@@ -60,7 +60,7 @@ std::function<void()> RefreshAttempt::MakeStep(Step step) {
 void RefreshAttempt::StartTimer() {
   auto timer = m_supplies->time.StartTimer(m_deadline, [weak = weak_from_this()] {
     if (const std::shared_ptr<RefreshAttempt> self = weak.lock()) {
-      self->Fail(std::make_exception_ptr(DeadlineExceededException("The deadline passed before the operation ended")));
+      self->FailLate();
       self->m_cancel.Cancel(); // afterwards: a request that ends at once because of it does not decide the outcome
     }
   });
@@ -155,6 +155,11 @@ void RefreshAttempt::AskService() {
 
 /// The callback does not own the attempt, because the provider may block longer than the attempt lasts.
 void RefreshAttempt::Acquire() {
+  // A renewal that ends at the deadline can be faster than the timer.
+  if (m_deadline <= m_supplies->time.GetSteadyTime()) {
+    FailLate();
+    return;
+  }
   m_supplies->credentials->Request(
       [weak = weak_from_this()](const Outcome<std::shared_ptr<const Credential>> &credential) {
         const std::shared_ptr<RefreshAttempt> self = weak.lock();
@@ -259,6 +264,15 @@ void RefreshAttempt::Fail(const std::exception_ptr &failure) noexcept {
     End(fallback, isIssued, failure);
   } else {
     End(failure, false);
+  }
+}
+
+/// Ends the attempt because its time is over.
+void RefreshAttempt::FailLate() noexcept {
+  try {
+    throw DeadlineExceededException("The deadline passed before the operation ended");
+  } catch (...) { // also if there is no memory for the exception
+    Fail(std::current_exception());
   }
 }
 

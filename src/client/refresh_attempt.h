@@ -78,6 +78,7 @@ private:
   void End(const TokenOutcome &outcome, bool isIssued, const std::exception_ptr &failure = nullptr) noexcept;
   bool IsStillUsable(const SamlToken &cached) const noexcept;
   void Fail(const std::exception_ptr &failure) noexcept;
+  void FailLate() noexcept;
   Ended Decide() noexcept;
 
   const std::shared_ptr<const RefreshSupplies> m_supplies;

@@ -218,6 +218,17 @@ TEST(TokenSourceRefresh, DoesNotAcquireWhenARenewalEndsBecauseItsTimeIsOver) {
   EXPECT_THAT(stage.issuer->GetTexts(), ElementsAre("acquire alice", "renew first 3600"));
 }
 
+TEST(TokenSourceRefresh, DoesNotAcquireWhenARenewalEndsAtItsDeadlineBeforeTheTimer) {
+  SourceStage stage;
+  stage.options.attemptTimeout = 5s;
+  stage.Provide(stage.Token("first", 1000s, DatedToken::Kind::RENEWABLE));
+  stage.time.Advance(800s);
+  stage.time.StartTimer(stage.time.GetSteadyTime() + 5s, [&] { stage.issuer->Answer(Failure("too late")); });
+  EXPECT_EQ(stage.Ask(), "first");
+  stage.time.Advance(5s);
+  EXPECT_THAT(stage.issuer->GetTexts(), ElementsAre("acquire alice", "renew first 3600"));
+}
+
 TEST(TokenSourceClock, SetForwardEndsTheTokenAtOnce) {
   SourceStage stage;
   stage.Provide(stage.Token("first", 1000s));
