@@ -53,8 +53,8 @@ std::string MakeHostHeader(const ConnectionSpec &spec, bool isSecure) {
 
 HttpExchange::HttpExchange(const Ref<ConnectionSpec> &spec, const Ref<CookieStore> &cookies, RequestData request,
                            UserAgent::CompletionFunction completion)
-    : m_spec(spec), m_cookies(cookies), m_endpoint(StringUtil::Shorten(spec->GetEndpointString())),
-      m_request(std::move(request)), m_reader(m_request.method == "HEAD"), m_completion(std::move(completion)) {
+    : m_endpoint(StringUtil::Shorten(spec->GetEndpointString())), m_request(std::move(request)),
+      m_reader(m_request.method == "HEAD"), m_spec(spec), m_cookies(cookies), m_completion(std::move(completion)) {
   OutOfMemory(); // makes the exception while there is memory
 }
 
@@ -64,9 +64,10 @@ HttpExchange::~HttpExchange() {
 
 void HttpExchange::Start() {
   const Ref self(this);
+  const Ref<ConnectionSpec> spec = m_spec; // the request may be done before `AsyncConnect` returns
   Ref<System::ScheduledItem> connecting;
   try {
-    connecting = m_spec->AsyncConnect(
+    connecting = spec->AsyncConnect(
         [self](const Ref<System::Stream> &stream, const Exception *failure) { self->OnConnected(stream, failure); });
   } catch (...) {
     if (Abandon()) {
@@ -233,9 +234,19 @@ void HttpExchange::FinishResponse() {
 }
 
 void HttpExchange::KeepCookies(const ResponseData &response) {
+  Ref<ConnectionSpec> spec;
+  Ref<CookieStore> cookies;
+  {
+    const std::lock_guard<ForkSafeMutex> lock(m_mutex);
+    if (m_isFinishing) {
+      return; // another step has failed, and has released them
+    }
+    spec = m_spec;
+    cookies = m_cookies;
+  }
   for (const auto &[name, value] : response.fields) {
     if (EqualsIgnoringCase(name, "Set-Cookie")) {
-      m_cookies->SetFromHeader(value, m_spec->GetHost(), m_request.target, m_isSecure);
+      cookies->SetFromHeader(value, spec->GetHost(), m_request.target, m_isSecure);
     }
   }
 }
@@ -271,6 +282,8 @@ std::shared_ptr<const Exception> HttpExchange::Cancelled(std::chrono::microsecon
 /// If both `failure` and `response` are null, the request was cancelled.
 void HttpExchange::Finish(std::shared_ptr<const Exception> failure, const Ref<ClientResponse> &response) noexcept {
   Ref<System::Stream> stream;
+  Ref<ConnectionSpec> spec;
+  Ref<CookieStore> cookies;
   UserAgent::CompletionFunction completion;
   bool isCancelled = false;
   std::chrono::microseconds exceededTimeout{0};
@@ -280,6 +293,8 @@ void HttpExchange::Finish(std::shared_ptr<const Exception> failure, const Ref<Cl
       return;
     }
     stream = std::move(m_stream);
+    spec = std::move(m_spec);
+    cookies = std::move(m_cookies);
     completion = std::exchange(m_completion, nullptr);
     isCancelled = m_isCancelled && !response;
     exceededTimeout = m_exceededTimeout;
@@ -290,6 +305,10 @@ void HttpExchange::Finish(std::shared_ptr<const Exception> failure, const Ref<Cl
   if (stream) {
     stream->Close();
   }
+  // Before the host learns of the end, so that its objects are not destroyed on this thread after that.
+  stream.reset();
+  spec.reset();
+  cookies.reset();
   Complete(completion, failure.get(), response);
   completion = nullptr; // releases what it captures before the waiting threads continue
   {

@@ -81,8 +81,6 @@ private:
   bool IsOfParent() const noexcept { return m_generation != GetForkGeneration(); }
 
   const unsigned m_generation = GetForkGeneration();
-  const Ref<ConnectionSpec> m_spec;
-  const Ref<CookieStore> m_cookies;
   const std::string m_endpoint; // for messages
 
   // Only one step at a time uses each of these members, so they need no lock. The message is kept until it is written.
@@ -96,6 +94,9 @@ private:
 
   mutable ForkSafeMutex m_mutex; // guards all members below; never held while a handler or a completion function runs
   std::condition_variable_any m_done;
+  // Null when the outcome is decided. The steps up to the write need no lock for them, because only later ones decide.
+  Ref<ConnectionSpec> m_spec;
+  Ref<CookieStore> m_cookies;
   Ref<System::ScheduledItem> m_connecting;
   Ref<System::Stream> m_stream;
   UserAgent::CompletionFunction m_completion;
