@@ -78,8 +78,8 @@ void HttpExchange::Start() {
   bool isCancelled = false;
   {
     const std::lock_guard<ForkSafeMutex> lock(m_mutex);
-    if (m_isFinishing || m_stream) {
-      return; // already connected, or failed
+    if (m_isConnectOver) {
+      return;
     }
     m_connecting = connecting;
     isCancelled = m_isCancelled;

@@ -12,14 +12,17 @@
 #include <gtest/gtest.h>
 
 #include <cstddef>
+#include <future>
 #include <string>
 #include <string_view>
+#include <thread>
 #include <utility>
 #include <vector>
 
 namespace Tarvel::Http {
 namespace {
 
+using testing::ElementsAre;
 using testing::IsEmpty;
 using testing::UnorderedElementsAre;
 
@@ -90,6 +93,50 @@ private:
   const Trace m_trace;
 };
 
+/// A connect that fails. The request is handling the failure when the starting call returns.
+class FailingSpec final : public OneStreamSpec {
+public:
+  explicit FailingSpec(Record &record) : OneStreamSpec(nullptr), m_record(record) {}
+
+  Ref<System::ScheduledItem> AsyncConnect(ConnectCompletion completion) const override {
+    m_thread = std::thread([this, completion = std::move(completion)] { completion(nullptr, &m_failure); });
+    m_failure.isHandled.get_future().wait();
+    return MakeRef<Item>(m_record);
+  }
+
+  void EndConnect() const {
+    m_failure.mayEnd.set_value();
+    m_thread.join();
+  }
+
+private:
+  class Item final : public System::ScheduledItem {
+  public:
+    explicit Item(Record &record) : m_trace(record, "item") {}
+    void Cancel() noexcept override {}
+    bool IsDone() const noexcept override { return true; }
+
+  private:
+    const Trace m_trace;
+  };
+
+  class Failure final : public System::NetworkException {
+  public:
+    Failure() : NetworkException("failed") {}
+    [[noreturn]] void Throw() const override {
+      isHandled.set_value();
+      mayEnd.get_future().wait();
+      throw System::NetworkException(*this);
+    }
+    mutable std::promise<void> isHandled;
+    mutable std::promise<void> mayEnd;
+  };
+
+  Record &m_record;
+  mutable Failure m_failure;
+  mutable std::thread m_thread;
+};
+
 class UserAgentReleaseTest : public UserAgentTest {
 protected:
   void TearDown() override { m_pending.reset(); }
@@ -145,6 +192,13 @@ TEST_F(UserAgentReleaseTest, ReleasesTheHostsObjectsBeforeItReportsThatItWasCanc
   Connect();
   EXPECT_THAT(m_destroyedBefore, UnorderedElementsAre("specification", "cookies"));
   EXPECT_THAT(m_record.destroyed, UnorderedElementsAre("specification", "cookies", "stream"));
+}
+
+TEST_F(UserAgentReleaseTest, ReleasesTheItemOfAConnectThatHasEndedBeforeItsStartReturns) {
+  const auto spec = MakeRef<FailingSpec>(m_record);
+  CreateHttpUserAgent(spec, m_cookies)->StartRequest(Post(), nullptr, m_pending);
+  EXPECT_THAT(m_record.destroyed, ElementsAre("item"));
+  spec->EndConnect();
 }
 
 TEST_F(UserAgentReleaseTest, IgnoresAnAnswerOverAStreamThatHasThrown) {
