@@ -111,7 +111,7 @@ public:
   /// reported as soon as its header has arrived. Content is not decoded: the request accepts no coding, and a 2xx or
   /// 500 response whose content has one is a failure. Bytes after the response are ignored. The request's body is wiped
   /// after it is sent. The request releases the connection specification, the cookie store and the stream before its
-  /// completion function is called, so it destroys none of them after that.
+  /// completion function is called. A stream of the platform exists until its last operation has ended, too.
   /// @throws InvalidArgumentException for a request that `CreateHttpRequest` did not make, InvalidStateException for one
   ///         that has been started, and any exception of the connection specification. In these cases the completion
   ///         function is not called.
