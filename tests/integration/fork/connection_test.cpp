@@ -106,10 +106,9 @@ std::string DescribeEpollSets() {
   return described;
 }
 
-// The parent is a child, too, because it has no sockets of earlier tests that an I/O thread may still close.
 TEST(SocketAfterFork, IsClosedInTheChildAndWorksInTheParent) {
   const ServerProcess server(Echo);
-  EXPECT_EQ(RunInChild([&] {
+  EXPECT_EQ(RunInChild([&] { // without threads that may still close sockets of earlier tests
               const std::set<std::string> before = DescriptorsOfKind("socket:");
               const Ref<System::TcpClientSocket> socket = Connect(server.GetPort());
               ASSERT_EQ(DescriptorsOfKind("socket:").size(), before.size() + 1);
