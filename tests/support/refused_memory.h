@@ -5,7 +5,6 @@
 
 #pragma once
 
-#include <atomic>
 #include <cstddef>
 #include <cstdlib>
 #include <new>
@@ -15,19 +14,20 @@ namespace Testing {
 /// Whether an allocation must fail; called for each one, on its thread. Must not allocate.
 bool IsMemoryRefused() noexcept;
 
-inline std::atomic<long> g_liveAllocations{0}; // not freed yet
+/// How many pieces of memory the calling thread has allocated, minus how many it has freed.
+inline thread_local long t_liveAllocations = 0;
 
 inline void *AllocateUnlessRefused(std::size_t bytes) {
   void *const memory = IsMemoryRefused() ? nullptr : std::malloc(bytes ? bytes : 1);
   if (!memory) {
     throw std::bad_alloc();
   }
-  ++g_liveAllocations;
+  ++t_liveAllocations;
   return memory;
 }
 
 inline void Free(void *memory) noexcept {
-  g_liveAllocations -= memory ? 1 : 0;
+  t_liveAllocations -= memory ? 1 : 0;
   std::free(memory);
 }
 

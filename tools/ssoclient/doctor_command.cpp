@@ -10,6 +10,7 @@
 #include "doctor_tls.h"
 #include "interruption.h"
 #include "option.h"
+#include "step_limit.h"
 #include "terminal_style.h"
 
 #include <tarvel/http/url.h>
@@ -17,7 +18,6 @@
 
 #include <boost/optional.hpp>
 
-#include <algorithm>
 #include <chrono>
 #include <cstdint>
 #include <memory>
@@ -30,21 +30,16 @@
 namespace SsoClient::Tool {
 namespace {
 
-/// How long each step may take without --timeout.
-constexpr std::chrono::microseconds DEFAULT_STEP = std::chrono::seconds(10);
-/// How much of the time of --timeout is kept to show the results; at most half of it.
-constexpr std::chrono::microseconds TIME_TO_SHOW = std::chrono::milliseconds(500);
-
 struct DoctorOptions {
   ConnectionOptions connection;
   std::vector<std::string> trustFiles;
 };
 
-/// How long one step may take. A step that hangs must end before --timeout ends the command, so that the results of the
-/// other steps are shown.
-std::chrono::microseconds StepLimit() {
-  const auto limit = GetTimeLimit();
-  return limit ? *limit - std::min(*limit / 2, TIME_TO_SHOW) : DEFAULT_STEP;
+/// How long a step that begins now may take.
+std::int64_t StepMicroseconds() {
+  const auto deadline = GetCallOptions().deadline;
+  const auto left = deadline ? *deadline - CallOptions::Clock::now() : CallOptions::Clock::duration::zero();
+  return StepLimit(GetTimeLimit(), std::chrono::duration_cast<std::chrono::microseconds>(left)).count();
 }
 
 DoctorTarget TargetOf(const std::string &url) {
@@ -68,13 +63,12 @@ std::vector<DoctorCheck> Examine(const DoctorOptions &options, const std::vector
   const DoctorTarget target = TargetOf(options.connection.url);
   const auto context = CreateContext(options.connection);
   const std::string &thumbprint = options.connection.thumbprint;
-  const std::int64_t timeout = StepLimit().count();
-  const auto probe = Tarvel::Ssl::ProbeServer(target.host, target.port, context, thumbprint, timeout);
+  const auto probe = Tarvel::Ssl::ProbeServer(target.host, target.port, context, thumbprint, StepMicroseconds());
   const Tarvel::System::DateTime now = Tarvel::System::GetUtcDateTime();
 
   boost::optional<DoctorExchange> exchange;
   if (MaySend(target, probe)) {
-    exchange = Exchange(target, context, thumbprint, timeout);
+    exchange = Exchange(target, context, thumbprint, StepMicroseconds());
   }
   const bool hasAnswer = exchange && exchange->failure.empty() && exchange->hasBody;
   return {CheckAddress(target, probe),

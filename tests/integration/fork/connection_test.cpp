@@ -108,25 +108,28 @@ std::string DescribeEpollSets() {
 
 TEST(SocketAfterFork, IsClosedInTheChildAndWorksInTheParent) {
   const ServerProcess server(Echo);
-  const std::set<std::string> before = DescriptorsOfKind("socket:");
-  const Ref<System::TcpClientSocket> socket = Connect(server.GetPort());
-  ASSERT_EQ(DescriptorsOfKind("socket:").size(), before.size() + 1);
-  const std::string watched = DescribeEpollSets();
-  ASSERT_NE(watched, "");
-  EXPECT_EQ(RunInChild([&] {
-              EXPECT_EQ(DescriptorsOfKind("socket:"), before);
-              const std::string target = "127.0.0.1:" + std::to_string(server.GetPort());
-              EXPECT_EQ(Write(*socket, "child"), "There is no connection to " + target);
-              EXPECT_EQ(Read(*socket), "There is no connection to " + target);
-              socket->Close();
-              const Ref<System::TcpClientSocket> own = Connect(server.GetPort());
-              EXPECT_EQ(Write(*own, "mine"), "");
-              EXPECT_EQ(Read(*own), "mine");
+  EXPECT_EQ(RunInChild([&] { // without threads that may still close sockets of earlier tests
+              const std::set<std::string> before = DescriptorsOfKind("socket:");
+              const Ref<System::TcpClientSocket> socket = Connect(server.GetPort());
+              ASSERT_EQ(DescriptorsOfKind("socket:").size(), before.size() + 1);
+              const std::string watched = DescribeEpollSets();
+              ASSERT_NE(watched, "");
+              EXPECT_EQ(RunInChild([&] {
+                          EXPECT_EQ(DescriptorsOfKind("socket:"), before);
+                          const std::string target = "127.0.0.1:" + std::to_string(server.GetPort());
+                          EXPECT_EQ(Write(*socket, "child"), "There is no connection to " + target);
+                          EXPECT_EQ(Read(*socket), "There is no connection to " + target);
+                          socket->Close();
+                          const Ref<System::TcpClientSocket> own = Connect(server.GetPort());
+                          EXPECT_EQ(Write(*own, "mine"), "");
+                          EXPECT_EQ(Read(*own), "mine");
+                        }),
+                        "");
+              EXPECT_EQ(DescribeEpollSets(), watched) << "nothing was removed from the epoll set or added to it";
+              EXPECT_EQ(Write(*socket, "parent"), "");
+              EXPECT_EQ(Read(*socket), "parent") << "without a byte of the child's before it";
             }),
             "");
-  EXPECT_EQ(DescribeEpollSets(), watched) << "nothing was removed from the parent's epoll set or added to it";
-  EXPECT_EQ(Write(*socket, "parent"), "");
-  EXPECT_EQ(Read(*socket), "parent") << "without a byte of the child's before it";
 }
 
 /// Whether two descriptors of two processes are copies of each other.

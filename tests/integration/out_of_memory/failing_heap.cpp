@@ -49,7 +49,7 @@ bool FailingHeap::HasFailed() const noexcept {
 }
 
 long CountHeapAllocations() noexcept {
-  return g_liveAllocations;
+  return t_liveAllocations;
 }
 
 } // namespace Testing

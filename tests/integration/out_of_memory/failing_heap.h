@@ -23,7 +23,7 @@ public:
   bool HasFailed() const noexcept;
 };
 
-/// The number of allocations of all threads that have not been freed.
+/// The number of allocations of the calling thread, minus how many it has freed.
 long CountHeapAllocations() noexcept;
 
 } // namespace Testing

@@ -112,13 +112,19 @@ TEST_F(SecretInput, EchoesAgainWhenTerminatedAtThePrompt) {
   }
 }
 
+// The shell starts the tool as a job that the keyboard can stop. The tool is stopped only when it has read the password
+// and the terminal echoes again.
 TEST_F(SecretInput, IsNotStoppedByTheKeyboardAtThePrompt) {
-  TerminalSession session(Acquire({"--user", "alice"}), TOKENS);
+  TerminalSession session(
+      ShellCommand("set -m; " + ShellLine("--user alice") + "; echo \"status $?\"; read answer; fg"), TOKENS);
   session.WaitFor("Password for alice: ");
-  session.Type("\x1A"); // Ctrl-Z, which flushes what was typed before
-  session.Type("wonderland");
-  EXPECT_FALSE(session.IsStopped());
-  EXPECT_FALSE(session.Echoes());
+  session.Type("\x1A"); // Ctrl-Z, which discards what was typed before
+  session.Type("wonderland\n");
+  session.WaitFor("status " + std::to_string(128 + SIGTSTP));
+  EXPECT_TRUE(session.Echoes());
+  session.Type("continue\n");
+  EXPECT_EQ(4, session.Finish());
+  EXPECT_EQ(std::string::npos, session.Shown().find("wonderland"));
 }
 
 TEST_F(SecretInput, RefusesTheEndOfInputAtThePrompt) {

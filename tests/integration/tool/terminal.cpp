@@ -6,7 +6,6 @@
 
 #include <array>
 #include <csignal>
-#include <fstream>
 #include <stdexcept>
 
 #include <poll.h>
@@ -94,17 +93,6 @@ bool TerminalSession::Echoes() const {
     throw std::runtime_error("tcgetattr");
   }
   return (settings.c_lflag & static_cast<tcflag_t>(ECHO)) != 0;
-}
-
-bool TerminalSession::IsStopped() const {
-  std::ifstream status("/proc/" + std::to_string(m_process) + "/status");
-  for (std::string word; status >> word;) {
-    if (word == "State:") {
-      status >> word;
-      return word == "T";
-    }
-  }
-  return false;
 }
 
 void TerminalSession::Signal(int signal) {

@@ -26,8 +26,6 @@ public:
   void Type(const std::string &text);
   /// Whether the terminal echoes what is typed.
   bool Echoes() const;
-  /// Whether the process is stopped. Does not wait.
-  bool IsStopped() const;
 
   void Signal(int signal);
   /// Waits until the main thread of the process blocks `signal`, so that another thread receives it.
