@@ -16,8 +16,8 @@ namespace Testing {
 
 namespace {
 
-/// How many numbers are tried, because one may be in use at another address. After a test of many connections, most of the
-/// system's free numbers may belong to connections that have just ended.
+/// How many numbers are tried, because one may be in use at another address. After a test of many connections, most
+/// numbers may belong to connections that have just ended.
 constexpr int TRIALS = 1000;
 
 constexpr const char *V4_ADDRESS = "127.0.0.1";

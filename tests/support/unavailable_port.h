@@ -21,8 +21,8 @@ private:
   const LoopbackPort m_port;
 };
 
-/// A port of 127.0.0.1 that accepts no more connections: its queue stays full. A connect gets no answer. At 127.0.0.2 and
-/// ::1 it is refused.
+/// A port of 127.0.0.1 that accepts no more connections: its queue stays full. A connect gets no answer. At 127.0.0.2
+/// and ::1 it is refused.
 class FullPort {
 public:
   FullPort();
