@@ -272,17 +272,15 @@ HeldServer::HeldServer(const std::string &body, Kind kind) {
       ::mmap(nullptr, sizeof(HeldServerState), PROT_READ | PROT_WRITE, MAP_SHARED | MAP_ANONYMOUS, -1, 0);
   Require(shared != MAP_FAILED, "no shared memory");
   m_state = new (shared) HeldServerState;
-  int port = 0;
-  const int listener = BindLoopback(false, port);
+  const LoopbackPort port; // the child keeps its copies of the sockets
   int flags = 1;
-  Require(::listen(listener, BACKLOG) == 0 && ::ioctl(listener, FIONBIO, &flags) == 0, "cannot listen");
+  Require(::listen(port.GetSocket(), BACKLOG) == 0 && ::ioctl(port.GetSocket(), FIONBIO, &flags) == 0, "cannot listen");
   m_process = ::fork();
   Require(m_process >= 0, "cannot fork");
   if (m_process == 0) {
-    Serve(*m_state, listener, body, kind);
+    Serve(*m_state, port.GetSocket(), body, kind);
   }
-  ::close(listener);
-  m_url = (kind == Kind::HTTP ? "http" : "https") + ("://localhost:" + std::to_string(port)) + "/sts";
+  m_url = (kind == Kind::HTTP ? "http" : "https") + ("://localhost:" + std::to_string(port.GetNumber())) + "/sts";
 }
 
 HeldServer::~HeldServer() {

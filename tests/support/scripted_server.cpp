@@ -3,7 +3,6 @@
 #include "support/scripted_server.h"
 
 #include "support/data_file.h"
-#include "support/loopback_socket.h"
 
 #include <openssl/err.h>
 #include <openssl/ssl.h>
@@ -278,16 +277,15 @@ std::string ServerConnection::GetClientName() const {
 }
 
 ScriptedServer::ScriptedServer(Script script, std::optional<TlsSettings> tls, bool v6)
-    : m_script(std::move(script)), m_tls(tls ? CreateTls(*tls) : nullptr), m_listener(BindLoopback(v6, m_port)) {
-  Require(::listen(m_listener, BACKLOG) == 0, "cannot listen");
+    : m_script(std::move(script)), m_tls(tls ? CreateTls(*tls) : nullptr), m_port(v6) {
+  Require(::listen(m_port.GetSocket(), BACKLOG) == 0, "cannot listen");
   m_acceptor = std::thread([this] { Accept(); });
 }
 
 ScriptedServer::~ScriptedServer() {
   m_stopping = true;
-  ::shutdown(m_listener, SHUT_RDWR); // wakes the acceptor
+  ::shutdown(m_port.GetSocket(), SHUT_RDWR); // wakes the acceptor, and refuses new connections
   m_acceptor.join();
-  ::close(m_listener);
   {
     const std::lock_guard<std::mutex> lock(m_mutex);
     for (const Running &running : m_running) {
@@ -307,10 +305,10 @@ void ScriptedServer::ChangeTls(const TlsSettings &settings) {
 
 void ScriptedServer::Accept() {
   BlockBrokenPipeSignal();
-  pollfd listener{m_listener, POLLIN, 0};
+  pollfd listener{m_port.GetSocket(), POLLIN, 0};
   while (!m_stopping) {
     if (::poll(&listener, 1, POLL_MILLISECONDS) > 0) {
-      const int descriptor = ::accept4(m_listener, nullptr, nullptr, SOCK_CLOEXEC);
+      const int descriptor = ::accept4(listener.fd, nullptr, nullptr, SOCK_CLOEXEC);
       if (descriptor >= 0) {
         Start(descriptor);
       }

@@ -5,6 +5,7 @@
 
 #pragma once
 
+#include "support/loopback_socket.h"
 #include "support/unavailable_port.h"
 
 #include <atomic>
@@ -109,7 +110,8 @@ public:
   /// Runs for each connection, for several at the same time. The connection ends when the script returns.
   using Script = std::function<void(ServerConnection &)>;
 
-  /// Listens on a free port of 127.0.0.1, or of ::1.
+  /// Listens on a free port of 127.0.0.1, or of ::1. Connecting to the same number at the other of these addresses, or
+  /// at 127.0.0.2, is refused.
   explicit ScriptedServer(Script script, std::optional<TlsSettings> tls = std::nullopt, bool v6 = false);
   ScriptedServer(const ScriptedServer &) = delete;
   ScriptedServer &operator=(const ScriptedServer &) = delete;
@@ -119,7 +121,7 @@ public:
   /// Changes the settings for connections that are accepted from now on.
   void ChangeTls(const TlsSettings &settings);
 
-  int GetPort() const noexcept { return m_port; }
+  int GetPort() const noexcept { return m_port.GetNumber(); }
   /// How many connections have been accepted so far.
   int GetConnectionCount() const noexcept { return m_accepted; }
   /// How many connections have a script that has not ended.
@@ -138,8 +140,7 @@ private:
 
   const Script m_script;
   ssl_ctx_st *m_tls = nullptr;
-  int m_port = 0; // before the listener, which sets it
-  int m_listener = -1;
+  const LoopbackPort m_port;
   std::atomic<int> m_accepted{0};
   std::atomic<bool> m_stopping{false};
   mutable std::mutex m_mutex; // guards m_running and, once there are connections, m_tls

@@ -2,7 +2,6 @@
 
 #include "support/unavailable_port.h"
 
-#include "support/loopback_socket.h"
 #include "support/scripted_server.h"
 
 #include <poll.h>
@@ -18,13 +17,7 @@ constexpr int WAIT_MILLISECONDS = 60'000;
 
 } // namespace
 
-UnusedPort::UnusedPort() : m_descriptor(BindLoopback(false, m_port)) {}
-
-UnusedPort::~UnusedPort() {
-  ::close(m_descriptor);
-}
-
-FullPort::FullPort() : m_listener(BindLoopback(false, m_port)) {
+FullPort::FullPort() {
   sockaddr_storage address{};
   socklen_t length = sizeof address;
   if (::listen(m_listener, 0) != 0 || ::getsockname(m_listener, reinterpret_cast<sockaddr *>(&address), &length) != 0) {
@@ -45,7 +38,6 @@ FullPort::FullPort() : m_listener(BindLoopback(false, m_port)) {
 
 FullPort::~FullPort() {
   Empty();
-  ::close(m_listener);
 }
 
 void FullPort::Empty() {

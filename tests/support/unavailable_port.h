@@ -4,33 +4,32 @@
 
 #pragma once
 
+#include "support/loopback_socket.h"
+
 #include <string_view>
 #include <vector>
 
 namespace Testing {
 
-/// A port of 127.0.0.1 on which no process listens: connecting is refused as long as this object exists.
+/// A port of 127.0.0.1, 127.0.0.2 and ::1 on which no process listens: connecting is refused as long as this object
+/// exists.
 class UnusedPort {
 public:
-  UnusedPort();
-  UnusedPort(const UnusedPort &) = delete;
-  UnusedPort &operator=(const UnusedPort &) = delete;
-  ~UnusedPort();
-  int GetPort() const noexcept { return m_port; }
+  int GetPort() const noexcept { return m_port.GetNumber(); }
 
 private:
-  int m_port = 0;        // before the descriptor, which sets it
-  int m_descriptor = -1; // bound, so that no other process can use the port, but not listening
+  const LoopbackPort m_port;
 };
 
-/// A port of 127.0.0.1 that accepts no more connections: its queue stays full. A connect gets no answer.
+/// A port of 127.0.0.1 that accepts no more connections: its queue stays full. A connect gets no answer. At 127.0.0.2
+/// and ::1 it is refused.
 class FullPort {
 public:
   FullPort();
   FullPort(const FullPort &) = delete;
   FullPort &operator=(const FullPort &) = delete;
   ~FullPort();
-  int GetPort() const noexcept { return m_port; }
+  int GetPort() const noexcept { return m_port.GetNumber(); }
 
   /// Empties the queue. Later connections get an answer from `AnswerAll`.
   void Empty();
@@ -39,8 +38,8 @@ public:
   void StopAnswering();
 
 private:
-  int m_port = 0; // before the listener, which sets it
-  int m_listener = -1;
+  const LoopbackPort m_port;
+  const int m_listener = m_port.GetSocket();
   std::vector<int> m_fillers;
 };
 

@@ -171,11 +171,13 @@ TEST(SpnegoHandler, LeaksNoDescriptor) {
     CreateSpnegoHandler(withKeytab)->NegotiateLeg({}); // this negotiation is not completed
   };
   negotiateOnce();
+  ASSERT_TRUE(Testing::DrainIoThreads()); // sockets of earlier tests may be closed late
   const std::size_t before = Testing::CountDescriptors();
   for (int i = 0; i < 10; ++i) {
     negotiateOnce();
   }
-  EXPECT_EQ(Testing::CountDescriptors(), before);
+  EXPECT_TRUE(Testing::Eventually([&] { return Testing::CountDescriptors() <= before; }))
+      << Testing::CountDescriptors() << " after " << before;
 }
 
 TEST(MemoryCache, HasAUniqueNameAndEndsWithItsObject) {

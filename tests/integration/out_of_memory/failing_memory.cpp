@@ -7,6 +7,7 @@
 #include <atomic>
 #include <cerrno>
 #include <cstdlib>
+#include <limits>
 
 #include <openssl/crypto.h>
 
@@ -14,23 +15,19 @@ namespace Testing {
 
 namespace {
 
-std::atomic<long> g_left{0}; // allocations until one fails; 0 if none will fail
+constexpr long NEVER = std::numeric_limits<long>::max();
+
+// Only FailingMemory begins and ends a shortage: an allocation on a late thread cannot begin another one.
+std::atomic<long> g_left{NEVER}; // allocations up to the one that fails; 0 or less after it
 std::atomic<bool> g_keepsFailing{false};
-std::atomic<bool> g_hasFailed{false};
 std::atomic<long> g_live{0};
 
 /// Whether this allocation fails; sets errno as `malloc` does.
 bool Fails() noexcept {
-  if (g_left.load() <= 0) {
+  const long left = g_left.fetch_sub(1);
+  if (left > 1 || (left < 1 && !g_keepsFailing)) {
     return false;
   }
-  if (g_left.fetch_sub(1) != 1) {
-    return false;
-  }
-  if (g_keepsFailing) {
-    g_left = 1;
-  }
-  g_hasFailed = true;
   errno = ENOMEM;
   return true;
 }
@@ -76,18 +73,17 @@ FailingMemory::FailingMemory(int number, Shortage shortage) {
     std::abort();
   }
   Tarvel::Crypto::ForgetRecentCertificates(); // so that decoding certificates can fail, too
-  g_hasFailed = false;
   g_keepsFailing = shortage == Shortage::FROM_THEN;
   g_left = number;
 }
 
 FailingMemory::~FailingMemory() {
   g_keepsFailing = false;
-  g_left = 0;
+  g_left = NEVER;
 }
 
 bool FailingMemory::HasFailed() const noexcept {
-  return g_hasFailed;
+  return g_left <= 0;
 }
 
 long CountForeignAllocations() {

@@ -281,17 +281,17 @@ TEST(ProbeServer, TriesEachAddressAndUsesTheFirstThatAnswers) {
   EXPECT_EQ(Outcome::ACCEPTED, probe.handshake->outcome);
 }
 
-/// Accepts TCP connections at 127.0.0.2 and never reads from them.
+/// Accepts TCP connections at 127.0.0.3 and never reads from them.
 class SilentNeighbour {
 public:
   explicit SilentNeighbour(int port) : m_listener(::socket(AF_INET, SOCK_STREAM | SOCK_CLOEXEC, 0)) {
     sockaddr_in address{};
     address.sin_family = AF_INET;
     address.sin_port = htons(static_cast<std::uint16_t>(port));
-    address.sin_addr.s_addr = htonl(INADDR_LOOPBACK + 1);
+    address.sin_addr.s_addr = htonl(INADDR_LOOPBACK + 2);
     if (::bind(m_listener, reinterpret_cast<sockaddr *>(&address), sizeof address) != 0 ||
         ::listen(m_listener, 1) != 0) {
-      throw std::runtime_error("no listener at 127.0.0.2");
+      throw std::runtime_error("no listener at 127.0.0.3");
     }
   }
   SilentNeighbour(const SilentNeighbour &) = delete;
@@ -306,7 +306,7 @@ TEST(ProbeServer, UsesTheFirstInOrderWhenSeveralAddressesAnswer) {
   ListeningServer server(Settings("localhost"));
   const SilentNeighbour neighbour(server.GetPort());
   const System::ScopedNameLookup lookup([](const std::string &) {
-    return System::AddressList{boost::asio::ip::make_address("127.0.0.1"), boost::asio::ip::make_address("127.0.0.2")};
+    return System::AddressList{boost::asio::ip::make_address("127.0.0.1"), boost::asio::ip::make_address("127.0.0.3")};
   });
   const ServerProbe probe = ProbeServer("localhost", server.GetPort(), CreateTrustingContext(), "", PATIENCE);
   ASSERT_EQ(2u, probe.addresses.size());

@@ -135,7 +135,7 @@ TEST(TcpClientSocket, ReportsARefusedConnection) {
 }
 
 TEST(TcpClientSocket, ReportsAnIPv6AddressInBrackets) {
-  const Testing::UnusedPort unused; // on 127.0.0.1; nothing listens on ::1 either
+  const Testing::UnusedPort unused;
   const std::string port = std::to_string(unused.GetPort());
   EXPECT_EQ(Connect("::1", unused.GetPort()), "Cannot connect to [::1]:" + port + ": Connection refused");
   EXPECT_EQ(Connect("[::1]", unused.GetPort()), "Cannot connect to [::1]:" + port + ": Connection refused");
