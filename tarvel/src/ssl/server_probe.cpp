@@ -14,8 +14,10 @@
 #include <algorithm>
 #include <cerrno>
 #include <chrono>
+#include <exception>
 #include <future>
 #include <memory>
+#include <optional>
 #include <string_view>
 #include <utility>
 
@@ -75,7 +77,20 @@ private:
 /// The result of a look-up. It is a class of this file so that no template with a type of Boost is exported.
 struct FoundAddresses {
   AddressList addresses;
+  std::optional<std::string> failure; // the reason why there is no address
 };
+
+/// @throws what the look-up threw, unless it is a NetworkException.
+FoundAddresses MakeResult(const AddressList &addresses, const std::exception_ptr &failure) {
+  if (!failure) {
+    return {addresses, std::nullopt};
+  }
+  try {
+    std::rethrow_exception(failure);
+  } catch (const System::NetworkException &reason) {
+    return {{}, reason.what()};
+  }
+}
 
 /// The addresses of a name that is not an address. @throws NetworkException; the message is only the reason.
 AddressList WaitForLookup(const std::string &host, Clock::time_point deadline) {
@@ -83,17 +98,21 @@ AddressList WaitForLookup(const std::string &host, Clock::time_point deadline) {
   std::future<FoundAddresses> result = promise->get_future();
   const Ref<System::ScheduledItem> lookup =
       System::StartSharedLookup(host, [promise](const AddressList &addresses, const std::exception_ptr &failure) {
-        if (failure) {
-          promise->set_exception(failure);
-        } else {
-          promise->set_value({addresses});
+        try {
+          promise->set_value(MakeResult(addresses, failure));
+        } catch (...) {
+          promise->set_exception(std::current_exception());
         }
       });
   if (result.wait_until(deadline) != std::future_status::ready) {
     lookup->Cancel();
     throw System::TimeoutException("the resolver did not answer in time");
   }
-  return result.get().addresses;
+  const FoundAddresses found = result.get();
+  if (found.failure) {
+    throw System::NetworkException(*found.failure);
+  }
+  return found.addresses;
 }
 
 AddressList LookUp(const std::string &host, int port, std::int64_t timeoutMicroseconds) {
