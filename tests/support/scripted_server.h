@@ -124,6 +124,8 @@ public:
   int GetConnectionCount() const noexcept { return m_accepted; }
   /// How many connections have a script that has not ended.
   std::size_t GetOpenCount() const;
+  /// How many connections still have memory. The server releases it a moment after the script has ended.
+  std::size_t GetRetainedCount() const noexcept { return m_retained; }
 
 private:
   struct Running {
@@ -141,6 +143,7 @@ private:
   int m_port = 0; // before the listener, which sets it
   int m_listener = -1;
   std::atomic<int> m_accepted{0};
+  std::atomic<std::size_t> m_retained{0};
   std::atomic<bool> m_stopping{false};
   mutable std::mutex m_mutex; // guards m_running and, once there are connections, m_tls
   std::list<Running> m_running;
