@@ -54,29 +54,30 @@ std::shared_ptr<const SsoClient::TokenClient> ConnectTo(const Testing::HeldServe
 
 void Crowd::Start(std::size_t count, const SsoClient::CallOptions &options) {
   {
-    const std::lock_guard<std::mutex> lock(m_mutex);
-    m_pending += count;
+    const std::lock_guard<std::mutex> lock(m_outcomes->mutex);
+    m_outcomes->pending += count;
   }
   const SsoClient::Credential credential =
       SsoClient::PasswordCredential{CROWD_USER, Tarvel::SecretText(std::string(CROWD_PASSWORD))};
   const SsoClient::TokenSpec spec = GetCrowdSpec();
   for (std::size_t i = 0; i < count; ++i) {
-    m_client->AcquireAsync(credential, spec, options,
-                           [this](const SsoClient::TokenOutcome &outcome) { Note(outcome); });
+    m_client->AcquireAsync(credential, spec, options, [outcomes = m_outcomes](const SsoClient::TokenOutcome &outcome) {
+      Note(*outcomes, outcome);
+    });
   }
 }
 
 void Crowd::WaitForTokens() {
-  std::unique_lock<std::mutex> lock(m_mutex);
-  if (!m_changed.wait_for(lock, PATIENCE, [this] { return m_pending == 0; })) {
-    throw std::runtime_error(std::to_string(m_pending) + " acquisitions have not ended");
+  std::unique_lock<std::mutex> lock(m_outcomes->mutex);
+  if (!m_outcomes->changed.wait_for(lock, PATIENCE, [this] { return m_outcomes->pending == 0; })) {
+    throw std::runtime_error(std::to_string(m_outcomes->pending) + " acquisitions have not ended");
   }
-  if (!m_wrong.empty()) {
-    throw std::runtime_error("an acquisition failed: " + m_wrong);
+  if (!m_outcomes->wrong.empty()) {
+    throw std::runtime_error("an acquisition failed: " + m_outcomes->wrong);
   }
 }
 
-void Crowd::Note(const SsoClient::TokenOutcome &outcome) {
+void Crowd::Note(Outcomes &outcomes, const SsoClient::TokenOutcome &outcome) {
   std::string wrong;
   try {
     if (outcome.Get()->GetSubject().ToString() != "{Name: alice; Domain:corp.example}") {
@@ -85,12 +86,12 @@ void Crowd::Note(const SsoClient::TokenOutcome &outcome) {
   } catch (const std::exception &failure) {
     wrong = failure.what();
   }
-  const std::lock_guard<std::mutex> lock(m_mutex);
-  if (m_wrong.empty()) {
-    m_wrong = std::move(wrong);
+  const std::lock_guard<std::mutex> lock(outcomes.mutex);
+  if (outcomes.wrong.empty()) {
+    outcomes.wrong = std::move(wrong);
   }
-  if (--m_pending == 0) {
-    m_changed.notify_all();
+  if (--outcomes.pending == 0) {
+    outcomes.changed.notify_all();
   }
 }
 

@@ -46,13 +46,18 @@ public:
   void WaitForTokens();
 
 private:
-  void Note(const SsoClient::TokenOutcome &outcome);
+  /// The callbacks share it: they may be called when a failure has destroyed the crowd.
+  struct Outcomes {
+    std::mutex mutex; // guards all that follows
+    std::condition_variable changed;
+    std::size_t pending = 0;
+    std::string wrong; // the first outcome that is not the right token
+  };
+
+  static void Note(Outcomes &outcomes, const SsoClient::TokenOutcome &outcome);
 
   const std::shared_ptr<const SsoClient::TokenClient> m_client;
-  std::mutex m_mutex;
-  std::condition_variable m_changed;
-  std::size_t m_pending = 0; // guarded by the mutex
-  std::string m_wrong;       // guarded by the mutex
+  const std::shared_ptr<Outcomes> m_outcomes = std::make_shared<Outcomes>();
 };
 
 /// Waits until the server has received `count` requests in total; checks this each millisecond.

@@ -10,6 +10,7 @@
 #include <algorithm>
 #include <chrono>
 #include <future>
+#include <memory>
 #include <stdexcept>
 #include <thread>
 #include <vector>
@@ -22,28 +23,29 @@ using Clock = std::chrono::steady_clock;
 
 constexpr std::chrono::minutes LONGEST_START{1}; // for acquisitions to be under way before their deadlines
 
-/// When an acquisition has ended. It must end with an exception of the class `Expected`.
+/// When an acquisition has ended. It must end with an exception of the class `Expected`. The callback has its own reference
+/// to the result: another failure ends the measurement while acquisitions are under way.
 template <typename Expected>
 class End {
 public:
   SsoClient::TokenCallback GetCallback() {
-    return [this](const SsoClient::TokenOutcome &outcome) {
+    return [time = m_time](const SsoClient::TokenOutcome &outcome) {
       const Clock::time_point now = Clock::now();
       try {
         outcome.Get();
-        m_time.set_exception(std::make_exception_ptr(std::runtime_error("an acquisition has a token")));
+        time->set_exception(std::make_exception_ptr(std::runtime_error("an acquisition has a token")));
       } catch (const Expected &) {
-        m_time.set_value(now);
+        time->set_value(now);
       } catch (...) {
-        m_time.set_exception(std::current_exception());
+        time->set_exception(std::current_exception());
       }
     };
   }
 
-  Clock::time_point Wait() { return m_time.get_future().get(); }
+  Clock::time_point Wait() { return m_time->get_future().get(); }
 
 private:
-  std::promise<Clock::time_point> m_time;
+  const std::shared_ptr<std::promise<Clock::time_point>> m_time = std::make_shared<std::promise<Clock::time_point>>();
 };
 
 SsoClient::Credential GetCredential() {

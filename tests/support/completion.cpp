@@ -75,7 +75,7 @@ bool Completion::FailedWith(const std::type_info &expected) const {
 }
 
 bool DrainIoThreads() {
-  // Twice, because a thread may still queue work on another one that waits at the first meeting already.
+  // The second meeting is for work that a thread has queued on another one while that one waited at the first.
   return MeetIoThreads() && MeetIoThreads();
 }
 

@@ -319,6 +319,7 @@ void ScriptedServer::Accept() {
 
 void ScriptedServer::Start(int descriptor) {
   ++m_accepted;
+  ++m_retained;
   const std::lock_guard<std::mutex> lock(m_mutex);
   Running &running = m_running.emplace_back();
   running.connection = std::make_unique<ServerConnection>(descriptor, m_tls);
@@ -344,6 +345,9 @@ void ScriptedServer::Reap(bool all) {
   for (Running &running : ended) {
     running.thread.join();
   }
+  const std::size_t released = ended.size();
+  ended.clear();
+  m_retained -= released;
 }
 
 std::size_t ScriptedServer::GetOpenCount() const {

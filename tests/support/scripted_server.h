@@ -126,6 +126,8 @@ public:
   int GetConnectionCount() const noexcept { return m_accepted; }
   /// How many connections have a script that has not ended.
   std::size_t GetOpenCount() const;
+  /// How many connections still have memory. The server releases it a moment after the script has ended.
+  std::size_t GetRetainedCount() const noexcept { return m_retained; }
 
 private:
   struct Running {
@@ -142,6 +144,7 @@ private:
   ssl_ctx_st *m_tls = nullptr;
   const LoopbackPort m_port;
   std::atomic<int> m_accepted{0};
+  std::atomic<std::size_t> m_retained{0};
   std::atomic<bool> m_stopping{false};
   mutable std::mutex m_mutex; // guards m_running and, once there are connections, m_tls
   std::list<Running> m_running;

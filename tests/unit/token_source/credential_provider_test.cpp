@@ -8,7 +8,11 @@
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
 
+#include <deque>
+#include <functional>
+#include <memory>
 #include <stdexcept>
+#include <utility>
 
 namespace Testing {
 
@@ -109,6 +113,19 @@ TEST(CredentialRequests, DropARequestThatComesAfterTheirEnd) {
   requests->Request([captured](const auto &) { ADD_FAILURE() << "it was called back"; });
   EXPECT_EQ(calls, 0);
   EXPECT_EQ(captured.use_count(), 1);
+}
+
+TEST(CredentialRequests, DropTheCallbackWhenTheyEndDuringACall) {
+  std::shared_ptr<CredentialRequests> requests;
+  auto captured = std::make_shared<int>();
+  const std::weak_ptr<int> watched = captured;
+  const auto provider = [&]() -> Credential {
+    requests->Close();
+    EXPECT_TRUE(watched.expired());
+    return PasswordCredential{"alice", Tarvel::SecretText("x")};
+  };
+  requests = std::make_shared<CredentialRequests>(provider, [](const std::function<void()> &call) { call(); });
+  requests->Request([captured = std::move(captured)](const auto &) { ADD_FAILURE() << "it was called back"; });
 }
 
 } // namespace Testing
