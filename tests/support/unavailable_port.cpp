@@ -17,6 +17,8 @@ constexpr int WAIT_MILLISECONDS = 60'000;
 
 } // namespace
 
+UnusedPort::UnusedPort() = default;
+
 FullPort::FullPort() {
   sockaddr_storage address{};
   socklen_t length = sizeof address;

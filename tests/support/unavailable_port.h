@@ -15,10 +15,11 @@ namespace Testing {
 /// exists.
 class UnusedPort {
 public:
+  UnusedPort();
   int GetPort() const noexcept { return m_port.GetNumber(); }
 
 private:
-  const LoopbackPort m_port{};
+  const LoopbackPort m_port;
 };
 
 /// A port of 127.0.0.1 that accepts no more connections: its queue stays full. A connect gets no answer. At 127.0.0.2
